@@ -1,0 +1,28 @@
+# The language level and the warnings that every target is built with, and what the tool's own code
+# is held to on top of them.
+set(CMAKE_CXX_STANDARD 17)
+set(CMAKE_CXX_STANDARD_REQUIRED ON)
+set(CMAKE_CXX_EXTENSIONS OFF)
+set(CMAKE_POSITION_INDEPENDENT_CODE ON)
+set(CMAKE_EXPORT_COMPILE_COMMANDS ON)
+if(NOT CMAKE_BUILD_TYPE)
+  set(CMAKE_BUILD_TYPE Release)
+endif()
+set(CMAKE_CXX_FLAGS_RELEASE "-O2")
+
+add_compile_options(-Wall -Wextra -Werror)
+set(APKTOOLKIT_TOOL_OPTIONS -fno-exceptions -fno-rtti -Wconversion)
+
+set(APKTOOLKIT_SANITIZE "" CACHE STRING
+  "Sanitizers that everything is built with, as -fsanitize= takes them (empty: none)")
+if(APKTOOLKIT_SANITIZE)
+  add_compile_options(-fsanitize=${APKTOOLKIT_SANITIZE} -fno-sanitize-recover=all
+    -fno-omit-frame-pointer)
+  add_link_options(-fsanitize=${APKTOOLKIT_SANITIZE})
+endif()
+
+option(APKTOOLKIT_COVERAGE "Count the lines that run (scripts/coverage)" OFF)
+if(APKTOOLKIT_COVERAGE)
+  add_compile_options(--coverage -O0)
+  add_link_options(--coverage)
+endif()

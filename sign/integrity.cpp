@@ -1,0 +1,66 @@
+#include "sign/integrity.h"
+
+#include <fcntl.h>
+#include <unistd.h>
+
+#include <cstdio>
+#include <memory>
+
+namespace {
+
+// The kernel's private fcntl commands.
+constexpr int kSignCommand = 1124;
+constexpr int kVerifyCommand = 1125;
+
+constexpr uint32_t kNotSettled = 0xFFFFFFFF;
+constexpr useconds_t kPollMicroseconds = 10000;
+constexpr size_t kPathSize = 256;
+
+bool MaySign(uint32_t integrity) {
+  // Deliberate: a waiting read never ends with the value "not settled", yet the test refuses it
+  // together with 0 (the addition wraps), so that no change to the reader can let it through.
+  return integrity + 1 >= 2;
+}
+
+bool FormatIntegrityPath(int pid, char (&path)[kPathSize]) {
+  if (pid < 0) return false;
+  const int length = pid == 0 ? snprintf(path, kPathSize, "%s", "/proc/self/integrity/value")
+                              : snprintf(path, kPathSize, "/proc/%d/integrity/value", pid);
+  return length >= 0 && static_cast<size_t>(length) < kPathSize;
+}
+
+bool ReadHexadecimal(const char* path, uint32_t* value) {
+  struct CloseFile {
+    void operator()(FILE* file) const { fclose(file); }
+  };
+  const std::unique_ptr<FILE, CloseFile> file(fopen(path, "r"));
+  unsigned int read = 0;
+  if (file == nullptr || fscanf(file.get(), "%x", &read) != 1) return false;
+  *value = read;
+  return true;
+}
+
+}  // namespace
+
+uint32_t VeltSignFd(int fd, const void* payload) {
+  if (payload == nullptr) return kVeltFailure;
+  uint32_t integrity = 0;
+  if (VeltTaskReadIntegrity(0, 1, &integrity) != 0) return kVeltFailure;
+  if (!MaySign(integrity)) return kVeltFailure;
+  return fcntl(fd, kSignCommand, payload) == 0 ? 0 : kVeltFailure;
+}
+
+uint32_t VeltVerifyFd(int fd) { return fcntl(fd, kVerifyCommand) == 0 ? 0 : kVeltFailure; }
+
+uint32_t VeltTaskReadIntegrity(int pid, uint32_t wait, uint32_t* value) {
+  char path[kPathSize] = {};
+  if (value == nullptr || !FormatIntegrityPath(pid, path)) return kVeltFailure;
+  const bool waits = (wait & 1) != 0;
+  // Deliberate: no bound on the repetitions. The kernel settles every task's value in the end, and
+  // giving up earlier would leave the file unsigned for good.
+  while (ReadHexadecimal(path, value)) {
+    if (!waits || *value != kNotSettled) return 0;
+    usleep(kPollMicroseconds);
+  }
+  return kVeltFailure;
+}

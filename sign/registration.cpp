@@ -1,0 +1,1 @@
+#include "sign/registration.h"

@@ -1,0 +1,1 @@
+#include "util/digest.h"
