@@ -1,0 +1,16 @@
+// The fixed test keys of tests/support/keys, as the platform's libcrypto holds them.
+#pragma once
+
+#include <openssl/evp.h>
+#include <openssl/rsa.h>
+
+#include <string>
+
+// The path of the PEM file of key `name`, such as "rsa-2048".
+std::string TestKeyPath(const std::string& name);
+
+// The key `name`; loaded once and kept for the life of the program. Aborts when there is none.
+EVP_PKEY* TestKey(const std::string& name);
+
+// The same, as an RSA key.
+RSA* TestRsaKey(const std::string& name);
