@@ -15,3 +15,139 @@
 namespace {
 
 uint32_t VeltSignOat(ApkTools::Apk& apk, int fd);
+uint32_t SignPackage(ApkTools::Apk& apk, int fd);
+uint32_t SignJar(ApkTools::Apk& apk, int fd);
+std::vector<uint8_t> SignPayload(const std::vector<uint8_t>& data);
+std::string InstalledLibraryPath(const std::string& package_path, const std::string& entry_name);
+void SignLibrary(ApkTools::Apk& apk, const std::string& entry_name, const std::string& target);
+
+}  // namespace
+
+uint32_t VeltSign(ApkTools::Apk& apk, int zip_fd, int fd) {
+  LogInfo("VeltSign starts: zip_fd = %d, fd = %d.\n", zip_fd, fd);
+  if (!apk.IsGoodZip()) {
+    LogError("Zip archive is not valid for fd=%d\n", zip_fd);
+    return kVeltFailure;
+  }
+  const uint32_t result = VeltSignOat(apk, fd);
+  LogInfo("VeltSign finished: %u.\n", result);
+  return result;
+}
+
+uint32_t VeltSignJni(ApkTools::Apk& apk, int fd, const char* /*path*/) {
+  LogInfo("VeltSignJni starts: %d.\n", fd);
+  if (!apk.IsGoodApk()) {
+    LogError("VeltSignJni: malformed apk: %s\n", apk.GetPath().c_str());
+    return kVeltFailure;
+  }
+  // A walk that cannot start leaves the cookie null, and then delivers nothing.
+  void* cookie = nullptr;
+  apk.StartIteration(&cookie, "lib/", ".so");
+  ZipEntry entry;
+  std::string name;
+  while (apk.Next(cookie, &entry, name) == 0) {
+    const std::string target = InstalledLibraryPath(apk.GetPath(), name);
+    if (!target.empty()) SignLibrary(apk, name, target);
+  }
+  apk.EndIteration(cookie);
+  // Deliberate: a library that was refused does not change the result; its own message tells.
+  LogInfo("VeltSignJni finished: %u.\n", 0U);
+  return 0;
+}
+
+namespace {
+
+// Signs `fd`, the package file or one of its libraries, with the payload that suits `apk`.
+uint32_t VeltSignOat(ApkTools::Apk& apk, int fd) {
+  return apk.IsApk() ? SignPackage(apk, fd) : SignJar(apk, fd);
+}
+
+uint32_t SignPackage(ApkTools::Apk& apk, int fd) {
+  LogInfo("VeltSignOat: Apk case.\n");
+  if (!apk.IsGoodApk()) return kVeltFailure;
+  std::vector<uint8_t> digest;
+  ComputeSHA256Digest(apk.GetManufacturerKey(), digest);
+  const uint32_t result = VeltSignFd(fd, SignPayload(digest).data());
+  if (result != 0) {
+    const int error = errno;
+    LogError("VELT can't sign a file (result=%x, errno %d: %s).\n", result, error, strerror(error));
+  }
+  return result;
+}
+
+uint32_t SignJar(ApkTools::Apk& apk, int fd) {
+  LogInfo("VeltSignOat: non-Apk (Jar) case\n");
+  // Deliberate: what must be trusted already is the file that was opened as the archive, not `fd`.
+  uint32_t result = VeltVerifyFd(apk.GetFd());
+  if (result != 0) {
+    const int error = errno;
+    // Deliberate: information, not an error. Most JARs on a device were never signed, and an
+    // untrusted one is the ordinary case.
+    LogInfo("VELT can't verify a file %d: %s/%s.\n", error, apk.GetPackageName().c_str(),
+            strerror(error));
+    return result;
+  }
+  result = VeltSignFd(fd, SignPayload({}).data());
+  if (result != 0) {
+    const int error = errno;
+    LogError("VELT can't sign a non-APK file (result=%x, errno %d: %s).\n", result, error,
+             strerror(error));
+  }
+  return result;
+}
+
+// The kernel's payload: the length of `data` as 16 bits in host byte order, then `data`.
+std::vector<uint8_t> SignPayload(const std::vector<uint8_t>& data) {
+  const uint16_t length = static_cast<uint16_t>(data.size());
+  std::vector<uint8_t> payload(sizeof(length));
+  memcpy(payload.data(), &length, sizeof(length));
+  payload.insert(payload.end(), data.begin(), data.end());
+  return payload;
+}
+
+struct LibraryDirectory {
+  const char* entry_prefix;  // of the names in the archive
+  const char* installed;     // where the installer puts those libraries, beside the package
+};
+
+// The first row whose prefix matches wins, so the longer names come before "lib/armeabi", which is
+// a prefix of two of them.
+// Deliberate: "lib/armeabi-v8a" is in no usual list of ABIs; a package that has it means 64-bit
+// Arm.
+constexpr LibraryDirectory kLibraryDirectories[] = {
+    {"lib/armeabi-v7a", "lib/arm"},
+    {"lib/armeabi-v8a", "lib/arm64"},
+    {"lib/arm64-v8a", "lib/arm64"},
+    {"lib/armeabi", "lib/arm"},
+};
+
+// Where the library `entry_name` of the package lies on disk; empty when its ABI is none of ours.
+std::string InstalledLibraryPath(const std::string& package_path, const std::string& entry_name) {
+  for (const LibraryDirectory& row : kLibraryDirectories) {
+    const size_t prefix_length = strlen(row.entry_prefix);
+    // Deliberate: plain prefixes. No "/" has to follow, so "lib/armeabiX/a.so" is looked for in
+    // "lib/armX/"; the digest check that follows decides all the same.
+    if (entry_name.compare(0, prefix_length, row.entry_prefix) != 0) continue;
+    const std::string directory = package_path.substr(0, package_path.rfind('/') + 1);
+    return directory + row.installed + entry_name.substr(prefix_length);
+  }
+  return {};
+}
+
+void SignLibrary(ApkTools::Apk& apk, const std::string& entry_name, const std::string& target) {
+  if (!apk.VerifyFileHash(entry_name, target)) {
+    LogError("VeltSignJni: File not verified: %s\n", target.c_str());
+    return;
+  }
+  const int library_fd = open(target.c_str(), O_RDONLY);
+  if (library_fd < 0) {
+    const int error = errno;
+    LogError("File %s is not opened", target.c_str());
+    LogError("Error %d: %s.\n", error, strerror(error));
+    return;
+  }
+  VeltSignOat(apk, library_fd);
+  close(library_fd);
+}
+
+}  // namespace
