@@ -1,0 +1,1 @@
+#include "apk/base64.h"

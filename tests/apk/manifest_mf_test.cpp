@@ -1,0 +1,1 @@
+#include "apk/manifest_mf.h"
