@@ -1,0 +1,1 @@
+#include "crypto/asn1.h"

@@ -1,0 +1,1 @@
+#include "crypto/pkcs7.h"

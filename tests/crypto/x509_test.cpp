@@ -1,0 +1,1 @@
+#include "crypto/x509.h"

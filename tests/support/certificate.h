@@ -1,0 +1,61 @@
+// Building X.509 certificates (RFC 5280 §4.1), good ones and every kind of bad one.
+//
+// Each field holds the DER that goes into its place, header included, so that a test changes a
+// certificate by assigning to a field. A field that is left unset is made from the keys and the
+// digest when the certificate is built.
+#pragma once
+
+#include <optional>
+#include <string>
+#include <utility>
+#include <vector>
+
+#include "support/der.h"
+
+// The digests that a signature can be made over, with the object identifiers that go with them.
+enum class Digest { kMd5, kSha1, kSha256 };
+
+std::string DigestOid(Digest digest);        // of the digest itself
+std::string RsaSignatureOid(Digest digest);  // of RSA PKCS#1 v1.5 with it
+Bytes DigestOf(Digest digest, const Bytes& data);
+// PKCS#1 v1.5 signature by the RSA test key `key` (support/keys.h) over `data`; by an EC key, the
+// ECDSA signature.
+Bytes SignWith(const std::string& key, Digest digest, const Bytes& data);
+// AlgorithmIdentifier with NULL parameters, or with those given.
+Bytes AlgorithmIdentifier(const std::string& oid, const Bytes& parameters = der::Null());
+// SubjectPublicKeyInfo of the test key, and one that holds any RSAPublicKey or other contents.
+Bytes PublicKeyInfo(const std::string& key);
+Bytes PublicKeyInfoAround(const Bytes& public_key);
+
+// A Name of one attribute for each pair of object identifier and text, in UTF8Strings.
+Bytes Name(const std::vector<std::pair<std::string, std::string>>& attributes);
+// The Extension; a critical flag is written only when it is TRUE.
+Bytes Extension(const std::string& oid, const Bytes& value, bool critical = false);
+
+struct Certificate {
+  // The subject's key; the certificate is signed by it as well, unless `signing_key` says another.
+  std::string key = "rsa-2048";
+  std::string signing_key;
+  Digest digest = Digest::kSha256;
+
+  // The fields of the tbsCertificate, in order.
+  Bytes version = der::Context(0, der::Integer(2));  // empty: v1
+  Bytes serial = der::Integer(0x1234);
+  std::optional<Bytes> tbs_algorithm;
+  Bytes issuer = Name({{"2.5.4.3", "Test"}});
+  Bytes validity = der::Sequence(
+      {der::Element(der::kUtcTime, "200102030405Z"), der::Element(der::kUtcTime, "490102030405Z")});
+  Bytes subject = Name({{"2.5.4.3", "Test"}});
+  std::optional<Bytes> public_key_info;
+  Bytes issuer_unique_id;         // [1], or empty
+  Bytes subject_unique_id;        // [2], or empty
+  std::vector<Bytes> extensions;  // each an Extension; none: no [3]
+  Bytes tbs_tail;                 // whatever should follow
+
+  std::optional<Bytes> tbs;  // instead of all the fields above
+  std::optional<Bytes> signature_algorithm;
+  std::optional<Bytes> signature;  // the BIT STRING
+
+  Bytes Tbs() const;
+  Bytes Build() const;
+};

@@ -1,0 +1,58 @@
+// Writing DER (X.690), for the builders and for tests that need an element which no builder makes.
+// Nothing is checked: a test may nest and label elements as wrongly as it likes.
+#pragma once
+
+#include <cstdint>
+#include <string>
+#include <vector>
+
+using Bytes = std::vector<uint8_t>;
+
+// The pieces, one after the other.
+Bytes Concat(const std::vector<Bytes>& pieces);
+// The characters, as bytes.
+Bytes ToBytes(const std::string& text);
+// The bytes that the hexadecimal digits stand for; spaces are ignored.
+Bytes FromHex(const std::string& digits);
+
+namespace der {
+
+// Identifier octets of the universal types in use, the constructed bit included.
+enum Identifier : uint8_t {
+  kBoolean = 0x01,
+  kInteger = 0x02,
+  kBitString = 0x03,
+  kOctetString = 0x04,
+  kNull = 0x05,
+  kOid = 0x06,
+  kUtf8String = 0x0c,
+  kPrintableString = 0x13,
+  kIa5String = 0x16,
+  kUtcTime = 0x17,
+  kGeneralizedTime = 0x18,
+  kSequence = 0x30,
+  kSet = 0x31,
+};
+
+// One element: identifier octet, minimal length octets, contents.
+Bytes Element(uint8_t identifier, const Bytes& contents);
+Bytes Element(uint8_t identifier, const std::string& contents);
+
+Bytes Sequence(const std::vector<Bytes>& elements);
+Bytes Set(const std::vector<Bytes>& elements);
+// [number] around `contents`: constructed, or the primitive form of an IMPLICIT string.
+Bytes Context(uint8_t number, const Bytes& contents);
+Bytes ContextPrimitive(uint8_t number, const Bytes& contents);
+
+Bytes Boolean(uint8_t value);
+Bytes Integer(uint64_t value);
+// An INTEGER of these very bytes.
+Bytes Integer(const Bytes& contents);
+Bytes BitString(const Bytes& contents, uint8_t unused_bits = 0);
+Bytes OctetString(const Bytes& contents);
+Bytes Null();
+// The element, and the contents alone, of the OBJECT IDENTIFIER with this dotted text.
+Bytes Oid(const std::string& dotted);
+Bytes OidContents(const std::string& dotted);
+
+}  // namespace der
