@@ -1,0 +1,71 @@
+# Recipes for packages and their signers, made with the tools that developers make them with; for
+# scripts/demo and tests/journeys/make_golden_packages to source.
+
+recipes_dir=$(cd "$(dirname "${BASH_SOURCE[0]}")" && pwd)
+
+# make_unsigned_package APK: the example package of vault/, compiled and packed: its manifest, one
+# class and one native library for two kinds of processor.
+make_unsigned_package() {
+  local apk=$1 sources=$recipes_dir/vault work
+  work=$(mktemp -d)
+  mkdir -p "$work/lib/arm64-v8a" "$work/lib/armeabi-v7a"
+  compile_library aarch64-linux-android27 "$work/lib/arm64-v8a/libvault.so"
+  compile_library armv7a-linux-androideabi27 "$work/lib/armeabi-v7a/libvault.so"
+  smali assemble --api 27 -o "$work/classes.dex" "$sources/Vault.smali"
+  aapt package -f -M "$sources/AndroidManifest.xml" -F "$apk" \
+    -I /usr/share/android-framework-res/framework-res.apk
+  put_entries "$apk" "$work" classes.dex lib/{arm64-v8a,armeabi-v7a}/libvault.so
+  rm -r "$work"
+}
+
+compile_library() {  # TARGET LIBRARY
+  clang-14 -target "$1" -shared -fPIC -O2 -nostdlib -fuse-ld=lld -o "$2" \
+    "$recipes_dir/vault/vault.c"
+}
+
+# put_entries APK DIRECTORY ENTRY...: packs files of the directory, in place of entries so named.
+put_entries() {
+  local apk directory=$2
+  apk=$(realpath "$1")
+  shift 2
+  aapt remove "$apk" "$@" >/dev/null 2>&1 || true
+  (cd "$directory" && aapt add "$apk" "$@" >/dev/null)
+}
+
+# test_key NAME: the path of a fixed test key.
+test_key() {
+  echo "$recipes_dir/keys/$1.pem"
+}
+
+# make_signer KEY DIRECTORY: a self-signed certificate KEY.pem for the fixed test key, and the key
+# as apksigner (KEY.pk8) and jarsigner (KEY.p12, alias cert, password android) take it.
+make_signer() {
+  local key out=$2/$1
+  key=$(test_key "$1")
+  openssl req -x509 -new -key "$key" -sha256 -subj "/O=Example/CN=$1" -days 10000 -out "$out.pem"
+  openssl pkcs8 -topk8 -nocrypt -in "$key" -outform DER -out "$out.pk8"
+  openssl pkcs12 -export -inkey "$key" -in "$out.pem" -name cert -passout pass:android \
+    -out "$out.p12"
+}
+
+# install_libraries APK: puts the package's native libraries beside it, as the installer does.
+install_libraries() {
+  local directory work
+  directory=$(dirname "$1") work=$(mktemp -d)
+  unzip -q "$1" 'lib/*' -d "$work"
+  rm -rf "$directory/lib"
+  mkdir "$directory/lib"
+  mv "$work/lib/arm64-v8a" "$directory/lib/arm64"
+  mv "$work/lib/armeabi-v7a" "$directory/lib/arm"
+  rm -r "$work"
+}
+
+# signer_modulus CERTIFICATE: the modulus of the certificate's key, as hexadecimal digits.
+signer_modulus() {
+  openssl x509 -in "$1" -noout -modulus | sed 's/^Modulus=//'
+}
+
+# modulus_digest CERTIFICATE: the SHA-256 digest of that modulus's bytes.
+modulus_digest() {
+  signer_modulus "$1" | basenc --base16 -d | openssl dgst -sha256 -r | cut -d' ' -f1
+}
