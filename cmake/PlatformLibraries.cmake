@@ -2,8 +2,9 @@
 # /usr/include/android, libraries in the multiarch folder's `android/`. Their headers are system
 # headers (the `cfi` attribute warnings in them are not ours to mend), and their `libcrypto` is the
 # platform's, not the host's, so its folder comes first.
-set(PLATFORM_INCLUDE_DIR /usr/include/android CACHE PATH "Headers of the platform libraries")
-set(PLATFORM_LIBRARY_DIR /usr/lib/${CMAKE_LIBRARY_ARCHITECTURE}/android CACHE PATH
+set(PLATFORM_INCLUDE_DIR ${CMAKE_SYSROOT}/usr/include/android CACHE PATH
+  "Headers of the platform libraries")
+set(PLATFORM_LIBRARY_DIR ${CMAKE_SYSROOT}/usr/lib/${CMAKE_LIBRARY_ARCHITECTURE}/android CACHE PATH
   "Platform libraries")
 
 foreach(name ziparchive androidfw utils log crypto)

@@ -1,0 +1,57 @@
+// The platform zip library as it looks on API level 27: names are ZipString, handles are void*, an
+// absent filter is a null pointer. Found instead of the library's own header in the preset
+// `zipstring`, so that the tool and its tests are built and run against this generation too.
+//
+// Only what the two generations differ in is defined here (zipstring_library.cpp), on top of the
+// library that is installed.
+#pragma once
+
+#include <sys/types.h>
+
+#include <cstdint>
+
+// `name` is not NUL-terminated.
+struct ZipString {
+  const uint8_t* name;
+  uint16_t name_length;
+
+  ZipString() {}  // leaves both fields as they are, as on the phone
+  // Ends the program when `entry_name` is longer than 65,535 bytes.
+  explicit ZipString(const char* entry_name);
+
+  bool operator==(const ZipString& other) const;
+  bool StartsWith(const ZipString& prefix) const;
+  bool EndsWith(const ZipString& suffix) const;
+};
+
+struct ZipEntry {
+  uint16_t method;
+  uint32_t mod_time;
+  mode_t unix_mode;
+  uint8_t has_data_descriptor;
+  uint32_t crc32;
+  uint32_t compressed_length;
+  uint32_t uncompressed_length;
+  off64_t offset;
+};
+
+using ZipArchiveHandle = void*;
+
+int32_t OpenArchive(const char* file_name, ZipArchiveHandle* handle);
+int32_t OpenArchiveFd(int fd, const char* debug_file_name, ZipArchiveHandle* handle,
+                      bool assume_ownership = true);
+void CloseArchive(ZipArchiveHandle archive);
+
+int32_t FindEntry(ZipArchiveHandle archive, const ZipString& entry_name, ZipEntry* data);
+
+int32_t StartIteration(ZipArchiveHandle archive, void** cookie, const ZipString* optional_prefix,
+                       const ZipString* optional_suffix);
+int32_t Next(void* cookie, ZipEntry* data, ZipString* name);
+
+int32_t ExtractToMemory(ZipArchiveHandle archive, ZipEntry* entry, uint8_t* begin, uint32_t size);
+
+int GetFileDescriptor(ZipArchiveHandle archive);
+
+// The same in both generations: the installed library answers.
+void EndIteration(void* cookie);
+const char* ErrorCodeString(int32_t error_code);

@@ -1,0 +1,34 @@
+// The zip library that is installed, in words that clash with neither generation of its header:
+// zipstring_library.cpp sees the old one, installed_library.cpp the library's own. Codes, life
+// times and handles are the library's.
+#pragma once
+
+#include <sys/types.h>
+
+#include <cstdint>
+#include <string_view>
+
+namespace installed {
+
+struct Entry {
+  uint16_t method;
+  uint32_t mod_time;
+  mode_t unix_mode;
+  uint8_t has_data_descriptor;
+  uint32_t crc32;
+  uint32_t compressed_length;
+  uint32_t uncompressed_length;
+  off64_t offset;
+};
+
+int32_t Open(const char* file_name, void** archive);
+int32_t OpenFd(int fd, const char* debug_file_name, void** archive, bool assume_ownership);
+void Close(void* archive);
+int32_t Find(void* archive, std::string_view name, Entry* entry);
+// An empty filter is none.
+int32_t Start(void* archive, void** cookie, std::string_view prefix, std::string_view suffix);
+int32_t Advance(void* cookie, Entry* entry, std::string_view* name);
+int32_t Extract(void* archive, const Entry& entry, uint8_t* begin, uint32_t size);
+int Descriptor(void* archive);
+
+}  // namespace installed
