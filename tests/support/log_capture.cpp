@@ -2,6 +2,7 @@
 
 #include <android/log.h>
 
+#include <cerrno>
 #include <cstdarg>
 #include <cstdio>
 #include <ostream>
@@ -35,5 +36,6 @@ extern "C" int __android_log_print(int priority, const char* tag, const char* fo
   const int length = vsnprintf(text, sizeof(text), format, arguments);
   va_end(arguments);
   KeepLogRecord(priority, tag, text);
+  if (std::string(tag) == kLogTag) errno = EDOM;  // a log may change it, and its caller must not
   return length;
 }

@@ -1,0 +1,110 @@
+// The digests against the vectors of their standards, and against the openssl command line.
+#include "util/digest.h"
+
+#include <gtest/gtest.h>
+#include <unistd.h>
+
+#include <cstdio>
+#include <cstdlib>
+#include <fstream>
+#include <memory>
+#include <string>
+
+namespace {
+
+using Bytes = std::vector<uint8_t>;
+using Digest = void (*)(const Bytes&, Bytes&);
+
+Bytes ToBytes(const std::string& text) { return {text.begin(), text.end()}; }
+
+std::string Hex(const Bytes& bytes) {
+  std::string hex;
+  for (const uint8_t byte : bytes) {
+    char digits[3];
+    snprintf(digits, sizeof(digits), "%02x", byte);
+    hex += digits;
+  }
+  return hex;
+}
+
+std::string HexDigest(Digest digest, const std::string& text) {
+  Bytes out;
+  digest(ToBytes(text), out);
+  return Hex(out);
+}
+
+// What `openssl dgst -NAME` says of `bytes`.
+std::string OpensslDigest(const std::string& name, const Bytes& bytes) {
+  const std::string path = testing::TempDir() + "digest_test." + std::to_string(getpid());
+  std::ofstream(path, std::ios::binary)
+      .write(reinterpret_cast<const char*>(bytes.data()), static_cast<int>(bytes.size()));
+  const std::string command = "openssl dgst -r -" + name + " " + path;
+  const std::unique_ptr<FILE, int (*)(FILE*)> pipe(popen(command.c_str(), "r"), pclose);
+  char hex[65] = {};
+  if (pipe == nullptr || fscanf(pipe.get(), "%64[0-9a-f]", hex) != 1) return "no answer";
+  unlink(path.c_str());
+  return hex;
+}
+
+// RFC 1321, A.5.
+TEST(Digest, Md5OfThePublishedVectors) {
+  EXPECT_EQ("d41d8cd98f00b204e9800998ecf8427e", HexDigest(ComputeMD5Digest, ""));
+  EXPECT_EQ("0cc175b9c0f1b6a831c399e269772661", HexDigest(ComputeMD5Digest, "a"));
+  EXPECT_EQ("900150983cd24fb0d6963f7d28e17f72", HexDigest(ComputeMD5Digest, "abc"));
+  EXPECT_EQ("f96b697d7cb7938d525a2f31aaf161d0", HexDigest(ComputeMD5Digest, "message digest"));
+}
+
+// FIPS 180-2, appendix A, and the digest of nothing as NIST lists it.
+TEST(Digest, Sha1OfThePublishedVectors) {
+  EXPECT_EQ("da39a3ee5e6b4b0d3255bfef95601890afd80709", HexDigest(ComputeSHA1Digest, ""));
+  EXPECT_EQ("a9993e364706816aba3e25717850c26c9cd0d89d", HexDigest(ComputeSHA1Digest, "abc"));
+  EXPECT_EQ(
+      "84983e441c3bd26ebaae4aa1f95129e5e54670f1",
+      HexDigest(ComputeSHA1Digest, "abcdbcdecdefdefgefghfghighijhijkijkljklmklmnlmnomnopnopq"));
+}
+
+// FIPS 180-2, appendix B, and the digest of nothing as NIST lists it.
+TEST(Digest, Sha256OfThePublishedVectors) {
+  EXPECT_EQ("e3b0c44298fc1c149afbf4c8996fb92427ae41e4649b934ca495991b7852b855",
+            HexDigest(ComputeSHA256Digest, ""));
+  EXPECT_EQ("ba7816bf8f01cfea414140de5dae2223b00361a396177a9cb410ff61f20015ad",
+            HexDigest(ComputeSHA256Digest, "abc"));
+  EXPECT_EQ(
+      "248d6a61d20638b8e5c026930c3e6039a33ce45964ff2167f6ecedd419db06c1",
+      HexDigest(ComputeSHA256Digest, "abcdbcdecdefdefgefghfghighijhijkijkljklmklmnlmnomnopnopq"));
+}
+
+TEST(Digest, AgreesWithTheOpensslCommand) {
+  Bytes bytes;
+  for (uint32_t i = 0; i < 100003; ++i) bytes.push_back(static_cast<uint8_t>(i * i >> 3));
+  const std::pair<const char*, Digest> digests[] = {
+      {"md5", ComputeMD5Digest}, {"sha1", ComputeSHA1Digest}, {"sha256", ComputeSHA256Digest}};
+  for (const auto& [name, digest] : digests) {
+    Bytes out;
+    digest(bytes, out);
+    EXPECT_EQ(OpensslDigest(name, bytes), Hex(out)) << name;
+  }
+}
+
+TEST(Digest, OutputOfAnotherLengthBecomesTheDigestAlone) {
+  for (const size_t length : {0, 1, 16, 20, 32, 40, 1000}) {
+    Bytes md5(length, 0xEE);
+    Bytes sha1(length, 0xEE);
+    Bytes sha256(length, 0xEE);
+    ComputeMD5Digest(ToBytes("abc"), md5);
+    ComputeSHA1Digest(ToBytes("abc"), sha1);
+    ComputeSHA256Digest(ToBytes("abc"), sha256);
+    EXPECT_EQ("900150983cd24fb0d6963f7d28e17f72", Hex(md5)) << length;
+    EXPECT_EQ("a9993e364706816aba3e25717850c26c9cd0d89d", Hex(sha1)) << length;
+    EXPECT_EQ("ba7816bf8f01cfea414140de5dae2223b00361a396177a9cb410ff61f20015ad", Hex(sha256))
+        << length;
+  }
+}
+
+TEST(Digest, Sha256IntoAVectorOfFortyBytesMakesItThirtyTwoLong) {
+  Bytes out(40, 0xEE);
+  ComputeSHA256Digest(ToBytes("abc"), out);
+  EXPECT_EQ(32U, out.size());
+}
+
+}  // namespace
