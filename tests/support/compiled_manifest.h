@@ -1,0 +1,64 @@
+// Writing Android's compiled XML, good and bad: a string pool, then one node after the other, as
+// they are called for. Nothing checks that elements nest.
+#pragma once
+
+#include <cstdint>
+#include <string>
+#include <vector>
+
+#include "support/der.h"
+
+// One attribute of an element. Names and texts are UTF-8 and may hold NUL.
+struct XmlAttribute {
+  std::string name;
+  uint8_t type;            // of the typed value (Res_value)
+  std::string text;        // the string that raw value (and a string's data) refer to
+  bool has_raw = false;    // whether there is a raw value
+  uint32_t data = 0;       // the typed value of what is no string
+  std::string name_space;  // its URI; empty for none
+};
+
+inline constexpr char kAndroidNamespace[] = "http://schemas.android.com/apk/res/android";
+
+XmlAttribute StringAttribute(const std::string& name, const std::string& text);
+XmlAttribute ReferenceAttribute(const std::string& name, uint32_t resource);
+XmlAttribute IntAttribute(const std::string& name, uint32_t value);
+// Its typed value says "string", but there is no raw value to be read.
+XmlAttribute StringAttributeWithoutText(const std::string& name);
+// The same attribute in Android's namespace.
+XmlAttribute InAndroidNamespace(XmlAttribute attribute);
+
+class CompiledXml {
+ public:
+  enum class Pool { kUtf8, kUtf16 };
+
+  explicit CompiledXml(Pool pool = Pool::kUtf8) : pool_(pool) {}
+
+  CompiledXml& StartNamespace(const std::string& prefix, const std::string& uri);
+  CompiledXml& EndNamespace(const std::string& prefix, const std::string& uri);
+  CompiledXml& Start(const std::string& name, const std::vector<XmlAttribute>& attributes = {});
+  CompiledXml& End(const std::string& name);
+  // A start and an end tag.
+  CompiledXml& Element(const std::string& name, const std::vector<XmlAttribute>& attributes = {});
+  CompiledXml& Text(const std::string& text);
+  // A node with a header too short to be one: the document is bad from here on.
+  CompiledXml& BadNode();
+  // A start tag whose name is not in the string pool.
+  CompiledXml& StartWithoutName();
+  // A start of a namespace whose URI is not in the string pool.
+  CompiledXml& StartNamespaceWithoutUri();
+
+  Bytes Build() const;
+
+ private:
+  uint32_t Ref(const std::string& text);
+  void PutNodeHeader(uint16_t type, size_t extra_length);
+  void PutAttribute(const XmlAttribute& attribute);
+
+  Pool pool_;
+  std::vector<std::string> strings_;
+  Bytes nodes_;
+};
+
+// The manifest of a package of this name that asks for the secure-storage permission, or not.
+Bytes CompiledManifest(const std::string& package_name, bool secure_storage = false);

@@ -1,0 +1,95 @@
+#include "support/package.h"
+
+#include <openssl/bn.h>
+#include <openssl/rsa.h>
+#include <sys/mman.h>
+#include <unistd.h>
+
+#include <algorithm>
+#include <cstdio>
+#include <cstdlib>
+#include <fstream>
+
+#include "support/compiled_manifest.h"
+#include "support/jar.h"
+#include "support/keys.h"
+
+namespace {
+
+std::string ManifestText(const std::vector<ZipItem>& items,
+                         const std::vector<std::string>& digests) {
+  JarText manifest = JarText::Manifest().EndSection();
+  for (const ZipItem& item : items) manifest.Section(item.name, digests, item.data);
+  return manifest.text();
+}
+
+}  // namespace
+
+Package SignPackage(const PackageOptions& options) {
+  Package package;
+  const Bytes android_manifest = options.android_manifest.value_or(
+      CompiledManifest(options.package_name, options.secure_storage));
+  if (!android_manifest.empty()) package.items.push_back({kAndroidManifestName, android_manifest});
+  package.items.insert(package.items.end(), options.entries.begin(), options.entries.end());
+
+  std::string manifest = ManifestText(package.items, options.digests);
+  if (options.edit_manifest) manifest = options.edit_manifest(manifest);
+  std::string signature_file = SignatureFileText(manifest, options.signature_file_digests);
+  if (options.edit_signature_file) signature_file = options.edit_signature_file(signature_file);
+  const Bytes block = options.block.Build(ToBytes(signature_file));
+
+  package.items.push_back({kManifestName, ToBytes(manifest)});
+  package.items.push_back({options.base_name + ".SF", ToBytes(signature_file)});
+  package.items.push_back({options.base_name + options.block_extension, block});
+  return package;
+}
+
+ZipItem& Package::Item(const std::string& name) {
+  const auto found = std::find_if(items.begin(), items.end(),
+                                  [&](const ZipItem& item) { return item.name == name; });
+  if (found == items.end()) {
+    fprintf(stderr, "no entry %s in the package\n", name.c_str());
+    abort();
+  }
+  return *found;
+}
+
+void Package::Remove(const std::string& name) {
+  items.erase(items.begin() + (&Item(name) - &items[0]));
+}
+
+void Package::Tamper(const std::string& name) {
+  Bytes& data = Item(name).data;
+  data.at(data.size() / 2) ^= 1;
+}
+
+void Package::WriteTo(const std::string& path) const { WriteFile(path, Build()); }
+
+Bytes ModulusOf(const std::string& key) {
+  const BIGNUM* modulus = RSA_get0_n(TestRsaKey(key));
+  Bytes bytes(BN_num_bytes(modulus));
+  BN_bn2bin(modulus, bytes.data());
+  return bytes;
+}
+
+void WriteFile(const std::string& path, const Bytes& content) {
+  std::ofstream file(path, std::ios::binary);
+  file.write(reinterpret_cast<const char*>(content.data()),
+             static_cast<std::streamsize>(content.size()));
+  if (!file.flush()) {
+    fprintf(stderr, "cannot write %s\n", path.c_str());
+    abort();
+  }
+}
+
+MemoryFile::MemoryFile(const Bytes& content, const std::string& name)
+    : fd_(memfd_create(name.c_str(), MFD_CLOEXEC)), path_("/memfd:" + name + " (deleted)") {
+  if (fd_ < 0 ||
+      write(fd_, content.data(), content.size()) != static_cast<ssize_t>(content.size()) ||
+      lseek(fd_, 0, SEEK_SET) != 0) {
+    perror("memfd");
+    abort();
+  }
+}
+
+MemoryFile::~MemoryFile() { close(fd_); }

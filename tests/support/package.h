@@ -1,0 +1,81 @@
+// Making whole packages and JARs: entries, the manifest that lists them, the signature file and the
+// signature block.
+//
+// A package is made in two steps, so that a test can come between them: `SignPackage` signs, then
+// `Package` gives access to every entry (to tamper with it, remove it or add one), then `Build` or
+// `WriteTo` makes the archive.
+#pragma once
+
+#include <functional>
+#include <optional>
+#include <string>
+#include <vector>
+
+#include "support/certificate.h"
+#include "support/signature_block.h"
+#include "support/zip.h"
+
+inline constexpr char kManifestName[] = "META-INF/MANIFEST.MF";
+inline constexpr char kAndroidManifestName[] = "AndroidManifest.xml";
+
+// What to sign, and how. The defaults make a good package with a dex file and one native library.
+struct PackageOptions {
+  std::string package_name = "com.example.app";
+  bool secure_storage = false;
+  // Instead of the compiled manifest that the two fields above make; empty bytes: no entry (a JAR).
+  std::optional<Bytes> android_manifest;
+  // The entries beside the Android manifest, in their order in the archive.
+  std::vector<ZipItem> entries = {{"classes.dex", ToBytes("dex\n035")},
+                                  {"lib/arm64-v8a/libfoo.so", ToBytes("\177ELF foo")}};
+
+  // Digest attributes of the manifest's sections, and of the signature file without "-Manifest".
+  std::vector<std::string> digests = {"SHA-256-Digest"};
+  std::vector<std::string> signature_file_digests = {"SHA-256-Digest"};
+  // The names of the signature file and of its block, without ".SF" and ".RSA".
+  std::string base_name = "META-INF/CERT";
+  std::string block_extension = ".RSA";
+
+  // Each gets the text that was made, and gives the one to be signed.
+  std::function<std::string(const std::string&)> edit_manifest;
+  std::function<std::string(const std::string&)> edit_signature_file;
+  // Key, digest and faults of the block.
+  SignatureBlock block;
+};
+
+class Package {
+ public:
+  std::vector<ZipItem> items;
+
+  // The first entry of the name. Aborts when there is none.
+  ZipItem& Item(const std::string& name);
+  void Remove(const std::string& name);
+  // Flips one bit in the middle of the entry's data, after signing.
+  void Tamper(const std::string& name);
+
+  Bytes Build() const { return BuildZip(items); }
+  void WriteTo(const std::string& path) const;
+};
+
+Package SignPackage(const PackageOptions& options = {});
+
+// The big-endian modulus of the RSA test key: the manufacturer key of what is signed with it.
+Bytes ModulusOf(const std::string& key);
+
+void WriteFile(const std::string& path, const Bytes& content);
+
+// A file without a name on disk, for as long as the object lives.
+class MemoryFile {
+ public:
+  explicit MemoryFile(const Bytes& content, const std::string& name = "test");
+  ~MemoryFile();
+  MemoryFile(const MemoryFile&) = delete;
+  MemoryFile& operator=(const MemoryFile&) = delete;
+
+  int fd() const { return fd_; }
+  // What its descriptor resolves to.
+  std::string path() const { return path_; }
+
+ private:
+  int fd_;
+  std::string path_;
+};
