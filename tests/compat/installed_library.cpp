@@ -9,8 +9,9 @@ namespace {
 ZipArchiveHandle Handle(void* archive) { return static_cast<ZipArchiveHandle>(archive); }
 
 Entry FromLibrary(const ZipEntry& entry) {
-  return {entry.method, entry.mod_time,          entry.unix_mode,           entry.has_data_descriptor,
-          entry.crc32,  entry.compressed_length, entry.uncompressed_length, entry.offset};
+  return {
+      entry.method, entry.mod_time,          entry.unix_mode,           entry.has_data_descriptor,
+      entry.crc32,  entry.compressed_length, entry.uncompressed_length, entry.offset};
 }
 
 ZipEntry ToLibrary(const Entry& entry) {

@@ -15,13 +15,15 @@ std::string_view View(const ZipString& name) {
 std::string_view Filter(const ZipString* name) { return name == nullptr ? "" : View(*name); }
 
 ZipEntry FromInstalled(const installed::Entry& entry) {
-  return {entry.method, entry.mod_time,          entry.unix_mode,           entry.has_data_descriptor,
-          entry.crc32,  entry.compressed_length, entry.uncompressed_length, entry.offset};
+  return {
+      entry.method, entry.mod_time,          entry.unix_mode,           entry.has_data_descriptor,
+      entry.crc32,  entry.compressed_length, entry.uncompressed_length, entry.offset};
 }
 
 installed::Entry ToInstalled(const ZipEntry& entry) {
-  return {entry.method, entry.mod_time,          entry.unix_mode,           entry.has_data_descriptor,
-          entry.crc32,  entry.compressed_length, entry.uncompressed_length, entry.offset};
+  return {
+      entry.method, entry.mod_time,          entry.unix_mode,           entry.has_data_descriptor,
+      entry.crc32,  entry.compressed_length, entry.uncompressed_length, entry.offset};
 }
 
 }  // namespace
