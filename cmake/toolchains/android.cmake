@@ -1,0 +1,27 @@
+# 64-bit Arm, API level 27, with any clang and lld and a sysroot of your own, given as
+# -DCMAKE_SYSROOT=DIR: the C and C++ libraries of the target, and below usr/include and usr/lib the
+# platform libraries (or -DPLATFORM_INCLUDE_DIR and -DPLATFORM_LIBRARY_DIR; docs/porting.md).
+#
+# The system is called Linux, since CMake's own idea of Android asks for an NDK.
+set(CMAKE_SYSTEM_NAME Linux)
+set(CMAKE_SYSTEM_PROCESSOR aarch64)
+
+set(CMAKE_SYSROOT "" CACHE PATH "Root of the target's headers and libraries")
+if(NOT CMAKE_SYSROOT)
+  message(FATAL_ERROR "The android preset needs -DCMAKE_SYSROOT=DIR, see docs/porting.md")
+endif()
+set(CMAKE_TRY_COMPILE_PLATFORM_VARIABLES CMAKE_SYSROOT)
+
+if(NOT CMAKE_CXX_COMPILER)
+  find_program(ANDROID_CLANG NAMES clang++ clang++-14 REQUIRED)
+  set(CMAKE_CXX_COMPILER ${ANDROID_CLANG})
+endif()
+set(CMAKE_CXX_COMPILER_TARGET aarch64-linux-android27)
+set(CMAKE_LIBRARY_ARCHITECTURE aarch64-linux-android)
+set(CMAKE_EXE_LINKER_FLAGS_INIT "-fuse-ld=lld")
+set(CMAKE_SHARED_LINKER_FLAGS_INIT "-fuse-ld=lld")
+
+set(CMAKE_FIND_ROOT_PATH_MODE_PROGRAM NEVER)
+set(CMAKE_FIND_ROOT_PATH_MODE_LIBRARY ONLY)
+set(CMAKE_FIND_ROOT_PATH_MODE_INCLUDE ONLY)
+set(CMAKE_FIND_ROOT_PATH_MODE_PACKAGE ONLY)
