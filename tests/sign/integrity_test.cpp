@@ -1,0 +1,195 @@
+// The kernel interface: what is asked of the kernel, when it is not asked at all, and the waiting.
+#include "sign/integrity.h"
+
+#include <gtest/gtest.h>
+
+#include <cerrno>
+#include <cstring>
+
+#include "support/log_capture.h"
+#include "support/phone.h"
+
+namespace {
+
+using Events = std::vector<std::string>;
+
+constexpr char kSelf[] = "integrity /proc/self/integrity/value";
+constexpr uint8_t kPayload[] = {3, 0, 0xaa, 0xbb, 0xcc};  // length 3, then 3 bytes
+
+// The codes are part of the interface: 0, and 65536 for every failure.
+TEST(VeltResultCode, FailureIs65536) { EXPECT_EQ(kVeltFailure, 65536U); }
+
+TEST(VeltSignFd, SignsWithThePayloadAfterReadingTheOwnIntegrity) {
+  Phone phone;
+  EXPECT_EQ(VeltSignFd(7, kPayload), 0U);
+  EXPECT_EQ(phone.events, Events({kSelf, "sign 7 0300aabbcc"}));
+}
+
+TEST(VeltSignFd, AnEmptyPayloadIsTwoZeroBytes) {
+  Phone phone;
+  const uint8_t empty[2] = {};
+  EXPECT_EQ(VeltSignFd(7, empty), 0U);
+  EXPECT_EQ(phone.events, Events({kSelf, "sign 7 0000"}));
+}
+
+TEST(VeltSignFd, ANullPayloadTouchesNeitherProcNorTheKernel) {
+  Phone phone;
+  EXPECT_EQ(VeltSignFd(7, nullptr), 0x10000U);
+  EXPECT_EQ(phone.events, Events());
+}
+
+TEST(VeltSignFd, AnIntegrityOfZeroMayNotSign) {
+  Phone phone;
+  phone.integrity = {"0\n"};
+  EXPECT_EQ(VeltSignFd(7, kPayload), 0x10000U);
+  EXPECT_EQ(phone.events, Events({kSelf}));
+}
+
+TEST(VeltSignFd, TheSmallestAndTheLargestSettledValueMaySign) {
+  for (const char* value : {"1", "fffffffe"}) {
+    Phone phone;
+    phone.integrity = {value};
+    EXPECT_EQ(VeltSignFd(7, kPayload), 0U) << value;
+    EXPECT_EQ(phone.events, Events({kSelf, "sign 7 0300aabbcc"})) << value;
+  }
+}
+
+TEST(VeltSignFd, WaitsInSteps10MillisecondsLongUntilTheValueSettles) {
+  Phone phone;
+  phone.integrity = {"ffffffff\n", "ffffffff\n", "1f\n"};
+  EXPECT_EQ(VeltSignFd(7, kPayload), 0U);
+  EXPECT_EQ(phone.events,
+            Events({kSelf, "sleep 10000", kSelf, "sleep 10000", kSelf, "sign 7 0300aabbcc"}));
+}
+
+TEST(VeltSignFd, AValueThatSettlesToZeroMayNotSign) {
+  Phone phone;
+  phone.integrity = {"ffffffff\n", "0\n"};
+  EXPECT_EQ(VeltSignFd(7, kPayload), 0x10000U);
+  EXPECT_EQ(phone.events, Events({kSelf, "sleep 10000", kSelf}));
+}
+
+TEST(VeltSignFd, AMissingIntegrityFileMayNotSign) {
+  Phone phone;
+  phone.has_integrity_file = false;
+  EXPECT_EQ(VeltSignFd(7, kPayload), 0x10000U);
+  EXPECT_EQ(phone.events, Events({kSelf}));
+}
+
+TEST(VeltSignFd, TheRefusalOfTheKernelKeepsItsErrno) {
+  Phone phone;
+  phone.sign_errno = EPERM;
+  errno = 0;
+  EXPECT_EQ(VeltSignFd(7, kPayload), 0x10000U);
+  EXPECT_EQ(errno, EPERM);
+}
+
+TEST(VeltVerifyFd, ATrustedFileGivesZeroWithoutAskingForTheOwnIntegrity) {
+  Phone phone;
+  EXPECT_EQ(VeltVerifyFd(9), 0U);
+  EXPECT_EQ(phone.events, Events({"verify 9"}));
+}
+
+TEST(VeltVerifyFd, AFileThatTheKernelHasNotSignedFailsWithTheErrnoOfTheKernel) {
+  Phone phone;
+  phone.verify_errno = ENOKEY;
+  errno = 0;
+  EXPECT_EQ(VeltVerifyFd(9), 0x10000U);
+  EXPECT_EQ(errno, ENOKEY);
+}
+
+TEST(VeltVerifyFd, AKernelWithoutTheFeatureRefuses) {
+  // No Phone: this machine's own kernel, which does not know the command.
+  errno = 0;
+  EXPECT_EQ(VeltVerifyFd(0), 0x10000U);
+  EXPECT_EQ(errno, EINVAL);
+}
+
+TEST(VeltTaskReadIntegrity, ProcessIdZeroReadsTheOwnFile) {
+  Phone phone;
+  uint32_t value = 5;
+  EXPECT_EQ(VeltTaskReadIntegrity(0, 0, &value), 0U);
+  EXPECT_EQ(value, 0x1fU);
+  EXPECT_EQ(phone.events, Events({kSelf}));
+}
+
+TEST(VeltTaskReadIntegrity, AProcessIdReadsTheFileOfThatTask) {
+  Phone phone;
+  uint32_t value = 5;
+  EXPECT_EQ(VeltTaskReadIntegrity(42, 0, &value), 0U);
+  EXPECT_EQ(value, 0x1fU);
+  EXPECT_EQ(phone.events, Events({"integrity /proc/42/integrity/value"}));
+}
+
+TEST(VeltTaskReadIntegrity, ANegativeProcessIdFailsWithoutOpeningAnything) {
+  Phone phone;
+  uint32_t value = 5;
+  EXPECT_EQ(VeltTaskReadIntegrity(-1, 0, &value), 0x10000U);
+  EXPECT_EQ(value, 5U);
+  EXPECT_EQ(phone.events, Events());
+}
+
+TEST(VeltTaskReadIntegrity, ANullValueFailsWithoutOpeningAnything) {
+  Phone phone;
+  EXPECT_EQ(VeltTaskReadIntegrity(0, 0, nullptr), 0x10000U);
+  EXPECT_EQ(phone.events, Events());
+}
+
+TEST(VeltTaskReadIntegrity, TextThatIsNotHexadecimalLeavesTheValueUnchanged) {
+  for (const uint32_t wait : {0U, 1U}) {
+    Phone phone;
+    phone.integrity = {"settled\n"};
+    uint32_t value = 5;
+    EXPECT_EQ(VeltTaskReadIntegrity(0, wait, &value), 0x10000U);
+    EXPECT_EQ(value, 5U);
+    EXPECT_EQ(phone.events, Events({kSelf}));
+  }
+}
+
+TEST(VeltTaskReadIntegrity, AnEmptyFileFails) {
+  Phone phone;
+  phone.integrity = {""};
+  uint32_t value = 5;
+  EXPECT_EQ(VeltTaskReadIntegrity(0, 0, &value), 0x10000U);
+  EXPECT_EQ(value, 5U);
+}
+
+TEST(VeltTaskReadIntegrity, WithoutWaitingAnUnsettledValueIsReturnedAsItIs) {
+  Phone phone;
+  phone.integrity = {"ffffffff\n", "1f\n"};
+  uint32_t value = 5;
+  EXPECT_EQ(VeltTaskReadIntegrity(0, 0, &value), 0U);
+  EXPECT_EQ(value, 0xFFFFFFFFU);
+  EXPECT_EQ(phone.events, Events({kSelf}));
+}
+
+TEST(VeltTaskReadIntegrity, OnlyBit0AsksToWait) {
+  Phone phone;
+  phone.integrity = {"ffffffff\n", "1f\n"};
+  uint32_t value = 5;
+  EXPECT_EQ(VeltTaskReadIntegrity(0, 0xFFFFFFFE, &value), 0U);
+  EXPECT_EQ(value, 0xFFFFFFFFU);
+  EXPECT_EQ(VeltTaskReadIntegrity(0, 3, &value), 0U);
+  EXPECT_EQ(value, 0x1fU);
+}
+
+TEST(VeltTaskReadIntegrity, AFileThatGoesBadWhileWaitingFailsWithTheLastValueRead) {
+  Phone phone;
+  phone.integrity = {"ffffffff\n", "gone\n"};
+  uint32_t value = 5;
+  EXPECT_EQ(VeltTaskReadIntegrity(0, 1, &value), 0x10000U);
+  EXPECT_EQ(value, 0xFFFFFFFFU);
+  EXPECT_EQ(phone.events, Events({kSelf, "sleep 10000", kSelf}));
+}
+
+TEST(VeltTaskReadIntegrity, WritesNothingToTheLog) {
+  Phone phone;
+  phone.has_integrity_file = false;
+  LogCapture log;
+  uint32_t value = 5;
+  EXPECT_EQ(VeltTaskReadIntegrity(0, 1, &value), 0x10000U);
+  EXPECT_EQ(VeltSignFd(7, kPayload), 0x10000U);
+  EXPECT_EQ(log.records(), Records());
+}
+
+}  // namespace

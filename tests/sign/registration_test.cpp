@@ -1,0 +1,195 @@
+// Who is registered, under which name and with which bytes, and what is said about it.
+#include "sign/registration.h"
+
+#include <gtest/gtest.h>
+#include <openssl/sha.h>
+
+#include <cstring>
+
+#include "support/log_capture.h"
+#include "support/package.h"
+#include "support/phone.h"
+
+namespace {
+
+using Events = std::vector<std::string>;
+
+// An archive in memory, opened as the driver does, with the log and the phone ready.
+struct Opened {
+  explicit Opened(const Package& package) : file(package.Build(), "archive"), apk(file.fd()) {
+    log.Clear();
+  }
+  int fd() const { return file.fd(); }
+
+  LogCapture log;
+  Phone phone;
+  MemoryFile file;
+  ApkTools::Apk apk;
+};
+
+Package SecureStoragePackage() {
+  PackageOptions options;
+  options.secure_storage = true;
+  return SignPackage(options);
+}
+
+Package PlainJar() {
+  PackageOptions options;
+  options.android_manifest = Bytes();
+  return SignPackage(options);
+}
+
+std::string RegisterPackage(int fd) {
+  return "register " + std::to_string(fd) + " com.example.app " + Hex(ModulusOf("rsa-2048"));
+}
+
+// Four SHA-256 digests, each of the one before it, the first of the path's bytes; by libcrypto.
+std::string RegisterJar(int fd, const std::string& path) {
+  uint8_t block[4 * SHA256_DIGEST_LENGTH];
+  SHA256(reinterpret_cast<const uint8_t*>(path.data()), path.size(), block);
+  for (int i = 1; i < 4; ++i) {
+    SHA256(block + (i - 1) * SHA256_DIGEST_LENGTH, SHA256_DIGEST_LENGTH,
+           block + i * SHA256_DIGEST_LENGTH);
+  }
+  return "register " + std::to_string(fd) + " " + path + " " + Hex(block, sizeof(block));
+}
+
+TEST(ZuSign, APackageWithoutThePermissionIsLeftAlone) {
+  Opened file(SignPackage());
+  ZuSign(file.apk, file.fd(), file.fd());
+  EXPECT_EQ(file.phone.events, Events());
+  EXPECT_EQ(file.log.records(), Records());
+}
+
+TEST(ZuSign, APackageWithThePermissionIsRegisteredUnderItsNameWithItsSignersKey) {
+  Opened file(SecureStoragePackage());
+  ZuSign(file.apk, file.fd(), file.fd());
+  EXPECT_EQ(file.phone.events, Events({RegisterPackage(file.fd())}));
+  EXPECT_EQ(file.log.records(), Records({Info("ZuAddCertificate: ZuNewCertificate return 0.\n")}));
+}
+
+TEST(ZuSign, TheSecondResultOfSuccessIsLoggedAsSuccess) {
+  Opened file(SecureStoragePackage());
+  file.phone.zu_result = 0x10004;
+  ZuSign(file.apk, file.fd(), file.fd());
+  EXPECT_EQ(file.phone.events, Events({RegisterPackage(file.fd())}));
+  EXPECT_EQ(file.log.records(),
+            Records({Info("ZuAddCertificate: ZuNewCertificate return 65540.\n")}));
+}
+
+TEST(ZuSign, EveryOtherResultIsAFailure) {
+  for (const int result : {1, -1, 0x10000, 0x10003, 0x10005}) {
+    Opened file(SecureStoragePackage());
+    file.phone.zu_result = result;
+    ZuSign(file.apk, file.fd(), file.fd());
+    EXPECT_EQ(file.log.records(), Records({Error("ZuAddCertificate: ZuNewCertificate failed " +
+                                                 std::to_string(result) + ".\n")}));
+  }
+}
+
+TEST(ZuSign, TheRegistrationIsMadeForTheSecondDescriptor) {
+  Opened file(SecureStoragePackage());
+  ZuSign(file.apk, file.fd(), 0);
+  EXPECT_EQ(file.phone.events, Events({RegisterPackage(0)}));
+}
+
+TEST(ZuSign, APackageWithThePermissionThatTurnedBadIsNotRegistered) {
+  // The permission is known only of a package whose manifest verified; its dex file is bad.
+  Package package = SecureStoragePackage();
+  package.Tamper("classes.dex");
+  Opened file(package);
+  EXPECT_FALSE(file.apk.IsGoodApk());
+  file.log.Clear();
+  ZuSign(file.apk, 77, 78);
+  EXPECT_EQ(file.phone.events, Events());
+  EXPECT_EQ(file.log.records(),
+            Records({Error("Apk archive is not valid for fd=" + std::to_string(file.fd()) +
+                           ", path=/memfd:archive (deleted)\n")}));
+}
+
+TEST(ZuSign, APackageWhoseSecondDescriptorHasNoPathIsReportedAndRegistered) {
+  Opened file(SecureStoragePackage());
+  file.phone.nameless_fds = {file.fd()};
+  const std::string fd = std::to_string(file.fd());
+  ZuSign(file.apk, file.fd(), file.fd());
+  EXPECT_EQ(file.phone.events, Events({RegisterPackage(file.fd())}));
+  EXPECT_EQ(file.log.records(), Records({Error("Can't get oat location from fd=" + fd + "\n"),
+                                         Info("ZuAddCertificate: ZuNewCertificate return 0.\n")}));
+}
+
+TEST(ZuSign, AJarWithoutTheAttributeIsLeftAlone) {
+  Opened file(PlainJar());
+  ZuSign(file.apk, file.fd(), file.fd());
+  EXPECT_EQ(file.phone.events, Events());
+  EXPECT_EQ(file.log.records(), Records());
+}
+
+TEST(ZuSign, AJarWithAnEmptyAttributeIsLeftAlone) {
+  Opened file(PlainJar());
+  file.phone.zu_attribute_size = 0;
+  ZuSign(file.apk, file.fd(), file.fd());
+  EXPECT_EQ(file.phone.events, Events());
+  EXPECT_EQ(file.log.records(), Records());
+}
+
+TEST(ZuSign, AJarWithTheAttributeIsRegisteredUnderItsPathWithFourChainedDigests) {
+  Opened file(PlainJar());
+  file.phone.zu_attribute_size = 1;
+  ZuSign(file.apk, file.fd(), file.fd());
+  EXPECT_EQ(file.phone.events, Events({RegisterJar(file.fd(), "/memfd:archive (deleted)")}));
+  EXPECT_EQ(file.log.records(), Records({Info("ZuAddCertificate: Call ZuNewCertificate for JAR.\n"),
+                                         Info("ZuAddCertificate: ZuNewCertificate return 0.\n")}));
+}
+
+TEST(ZuSign, TheKeyBlockOfAJarIs128Bytes) {
+  Opened file(PlainJar());
+  file.phone.zu_attribute_size = 1;
+  ZuSign(file.apk, file.fd(), file.fd());
+  ASSERT_EQ(file.phone.events.size(), 1U);
+  const std::string& event = file.phone.events[0];
+  EXPECT_EQ(event.size() - event.rfind(' ') - 1, 2 * 128U);
+}
+
+TEST(ZuSign, AJarWithoutAPathIsReportedAndNotRegistered) {
+  Opened file(PlainJar());
+  file.phone.zu_attribute_size = 1;
+  file.phone.nameless_fds = {file.fd()};
+  ZuSign(file.apk, file.fd(), 0);
+  EXPECT_EQ(file.phone.events, Events());
+  EXPECT_EQ(file.log.records(),
+            Records({Error("Can't get jar location from fd=" + std::to_string(file.fd()) + "\n")}));
+}
+
+TEST(ZuSign, AJarWhoseSecondDescriptorHasNoPathIsReportedAndRegistered) {
+  Opened file(PlainJar());
+  file.phone.zu_attribute_size = 1;
+  file.phone.nameless_fds = {78};
+  ZuSign(file.apk, file.fd(), 78);
+  EXPECT_EQ(file.phone.events, Events({RegisterJar(78, "/memfd:archive (deleted)")}));
+  EXPECT_EQ(file.log.records(), Records({Error("Can't get oat location from fd=78\n"),
+                                         Info("ZuAddCertificate: Call ZuNewCertificate for JAR.\n"),
+                                         Info("ZuAddCertificate: ZuNewCertificate return 0.\n")}));
+}
+
+TEST(ZuSign, TheRefusalOfAJarIsReported) {
+  Opened file(PlainJar());
+  file.phone.zu_attribute_size = 1;
+  file.phone.zu_result = 5;
+  ZuSign(file.apk, file.fd(), file.fd());
+  EXPECT_EQ(file.log.records(), Records({Info("ZuAddCertificate: Call ZuNewCertificate for JAR.\n"),
+                                         Error("ZuAddCertificate: ZuNewCertificate failed 5.\n")}));
+}
+
+TEST(ZuSign, AFileThatIsNoZipArchiveStopsSilentlyAtThePermission) {
+  LogCapture log;
+  Phone phone;
+  phone.zu_attribute_size = 1;
+  MemoryFile file(ToBytes("no archive"));
+  ApkTools::Apk apk(file.fd());
+  log.Clear();
+  ZuSign(apk, file.fd(), file.fd());
+  EXPECT_EQ(phone.events, Events());
+  EXPECT_EQ(log.records(), Records());
+}
+
+}  // namespace

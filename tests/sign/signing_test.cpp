@@ -1,0 +1,374 @@
+// What the kernel is asked to sign, with which payload, and what is said about it. Packages are
+// real files with their libraries beside them; the kernel is the Phone's.
+#include "sign/signing.h"
+
+#include <fcntl.h>
+#include <gtest/gtest.h>
+#include <openssl/sha.h>
+#include <unistd.h>
+
+#include <cerrno>
+#include <cstring>
+
+#include "sign/integrity.h"
+#include "support/log_capture.h"
+#include "support/package.h"
+#include "support/phone.h"
+#include "support/temp_dir.h"
+
+namespace {
+
+using Events = std::vector<std::string>;
+
+constexpr char kSelf[] = "integrity /proc/self/integrity/value";
+
+// The payload of every package signed with the key "rsa-2048": the length 32, then the digest of
+// its modulus by libcrypto.
+std::string PackagePayload() {
+  const Bytes modulus = ModulusOf("rsa-2048");
+  uint8_t digest[SHA256_DIGEST_LENGTH];
+  SHA256(modulus.data(), modulus.size(), digest);
+  return "2000" + Hex(digest, sizeof(digest));
+}
+
+std::string SignEvent(int fd) { return "sign " + std::to_string(fd) + " " + PackagePayload(); }
+
+ZipItem Library(const std::string& name) { return {name, ToBytes("\177ELF " + name)}; }
+
+// A package in a folder of its own, opened as the driver does, with the log and the phone ready.
+class Opened {
+ public:
+  explicit Opened(const Package& package, const std::string& directory = "")
+      : path_(temp_.File(directory + "base.apk")) {
+    package.WriteTo(path_);
+    fd_ = open(path_.c_str(), O_RDONLY);
+    apk_.emplace(fd_);
+    log.Clear();
+  }
+  ~Opened() { close(fd_); }
+
+  // Puts the item's bytes on disk, at `path` in the package's folder.
+  void Install(const std::string& path, const ZipItem& item) const {
+    WriteFile(temp_.File(path), item.data);
+  }
+  std::string Path(const std::string& path) const { return temp_.path() + "/" + path; }
+
+  uint32_t SignJni() { return VeltSignJni(*apk_, fd_, "not used"); }
+  uint32_t Sign() { return VeltSign(*apk_, fd_, fd_); }
+
+  ApkTools::Apk& apk() { return *apk_; }
+  int fd() const { return fd_; }
+  const std::string& path() const { return path_; }
+
+  LogCapture log;
+  Phone phone;
+
+ private:
+  TempDir temp_;
+  std::string path_;
+  int fd_;
+  std::optional<ApkTools::Apk> apk_;
+};
+
+PackageOptions WithLibraries(const std::vector<ZipItem>& libraries) {
+  PackageOptions options;
+  options.entries = {{"classes.dex", ToBytes("dex\n035")}};
+  options.entries.insert(options.entries.end(), libraries.begin(), libraries.end());
+  return options;
+}
+
+PackageOptions PlainJar() {
+  PackageOptions options;
+  options.android_manifest = Bytes();
+  return options;
+}
+
+Package BadPackage() {
+  Package package = SignPackage();
+  package.Tamper(kManifestName);
+  return package;
+}
+
+LogRecord Starts(int fd) { return Info("VeltSignJni starts: " + std::to_string(fd) + ".\n"); }
+LogRecord Finished() { return Info("VeltSignJni finished: 0.\n"); }
+LogRecord SignStarts(int fd) {
+  const std::string text = std::to_string(fd);
+  return Info("VeltSign starts: zip_fd = " + text + ", fd = " + text + ".\n");
+}
+
+// --- VeltSign -----------------------------------------------------------------------------------
+
+TEST(VeltSign, AGoodPackageIsSignedWithTheDigestOfItsSignersKey) {
+  Opened file(SignPackage());
+  EXPECT_EQ(file.Sign(), 0U);
+  EXPECT_EQ(file.phone.events, Events({kSelf, SignEvent(file.fd())}));
+  EXPECT_EQ(file.log.records(), Records({SignStarts(file.fd()), Info("VeltSignOat: Apk case.\n"),
+                                         Info("VeltSign finished: 0.\n")}));
+}
+
+TEST(VeltSign, ThePayloadOfAPackageIs34BytesThatStartWith32And0) {
+  Opened file(SignPackage());
+  file.Sign();
+  ASSERT_EQ(file.phone.events.size(), 2U);
+  const std::string& event = file.phone.events[1];
+  const std::string payload = event.substr(event.rfind(' ') + 1);
+  EXPECT_EQ(payload.size(), 2 * 34U);
+  EXPECT_EQ(payload.substr(0, 4), "2000");
+}
+
+TEST(VeltSign, TheDescriptorForMessagesIsNotTheOneThatIsSigned) {
+  Opened file(SignPackage());
+  EXPECT_EQ(VeltSign(file.apk(), 77, file.fd()), 0U);
+  EXPECT_EQ(file.phone.events, Events({kSelf, SignEvent(file.fd())}));
+  EXPECT_EQ(file.log.records()[0],
+            Info("VeltSign starts: zip_fd = 77, fd = " + std::to_string(file.fd()) + ".\n"));
+}
+
+TEST(VeltSign, APackageThatDidNotVerifyIsNotSignedAndGetsNoMessageOfItsOwn) {
+  Opened file(BadPackage());
+  EXPECT_EQ(file.Sign(), kVeltFailure);
+  EXPECT_EQ(file.phone.events, Events());
+  EXPECT_EQ(file.log.records(), Records({SignStarts(file.fd()), Info("VeltSignOat: Apk case.\n"),
+                                         Info("VeltSign finished: 65536.\n")}));
+}
+
+TEST(VeltSign, AFileThatIsNoZipArchiveIsRefused) {
+  LogCapture log;
+  Phone phone;
+  MemoryFile file(ToBytes("no archive"));
+  ApkTools::Apk apk(file.fd());
+  log.Clear();
+  EXPECT_EQ(VeltSign(apk, 77, file.fd()), kVeltFailure);
+  EXPECT_EQ(phone.events, Events());
+  EXPECT_EQ(
+      log.records(),
+      Records({Info("VeltSign starts: zip_fd = 77, fd = " + std::to_string(file.fd()) + ".\n"),
+               Error("Zip archive is not valid for fd=77\n")}));
+}
+
+TEST(VeltSign, ARefusalOfTheKernelIsReportedWithItsErrno) {
+  Opened file(SignPackage());
+  file.phone.sign_errno = EPERM;
+  EXPECT_EQ(file.Sign(), kVeltFailure);
+  EXPECT_EQ(file.phone.events, Events({kSelf, SignEvent(file.fd())}));
+  EXPECT_EQ(file.log.records(),
+            Records({SignStarts(file.fd()), Info("VeltSignOat: Apk case.\n"),
+                     Error("VELT can't sign a file (result=10000, errno 1: Operation not "
+                           "permitted).\n"),
+                     Info("VeltSign finished: 65536.\n")}));
+}
+
+TEST(VeltSign, ATrustedJarIsSignedWithAnEmptyPayload) {
+  Opened file(SignPackage(PlainJar()));
+  EXPECT_EQ(file.Sign(), 0U);
+  const std::string fd = std::to_string(file.fd());
+  EXPECT_EQ(file.phone.events, Events({"verify " + fd, kSelf, "sign " + fd + " 0000"}));
+  EXPECT_EQ(file.log.records(),
+            Records({SignStarts(file.fd()), Info("VeltSignOat: non-Apk (Jar) case\n"),
+                     Info("VeltSign finished: 0.\n")}));
+}
+
+TEST(VeltSign, AJarIsVerifiedByItsOwnDescriptorAndSignedByTheOther) {
+  Opened file(SignPackage(PlainJar()));
+  EXPECT_EQ(VeltSign(file.apk(), file.fd(), 77), 0U);
+  EXPECT_EQ(file.phone.events,
+            Events({"verify " + std::to_string(file.fd()), kSelf, "sign 77 0000"}));
+}
+
+TEST(VeltSign, AJarThatTheKernelDoesNotTrustIsReportedAtInfoLevelAndNotSigned) {
+  Opened file(SignPackage(PlainJar()));
+  file.phone.verify_errno = ENOKEY;
+  EXPECT_EQ(file.Sign(), kVeltFailure);
+  EXPECT_EQ(file.phone.events, Events({"verify " + std::to_string(file.fd())}));
+  EXPECT_EQ(file.log.records(),
+            Records({SignStarts(file.fd()), Info("VeltSignOat: non-Apk (Jar) case\n"),
+                     Info("VELT can't verify a file 126: /Required key not available.\n"),
+                     Info("VeltSign finished: 65536.\n")}));
+}
+
+TEST(VeltSign, ATrustedJarThatTheKernelDoesNotSignIsReported) {
+  Opened file(SignPackage(PlainJar()));
+  file.phone.sign_errno = EROFS;
+  EXPECT_EQ(file.Sign(), kVeltFailure);
+  EXPECT_EQ(file.log.records(),
+            Records({SignStarts(file.fd()), Info("VeltSignOat: non-Apk (Jar) case\n"),
+                     Error("VELT can't sign a non-APK file (result=10000, errno 30: Read-only file "
+                           "system).\n"),
+                     Info("VeltSign finished: 65536.\n")}));
+}
+
+// --- VeltSignJni --------------------------------------------------------------------------------
+
+TEST(VeltSignJni, ALibraryIsSignedOnItsOwnDescriptorWithThePayloadOfThePackage) {
+  const ZipItem library = Library("lib/arm64-v8a/libfoo.so");
+  Opened file(SignPackage(WithLibraries({library})));
+  file.Install("lib/arm64/libfoo.so", library);
+  EXPECT_EQ(file.SignJni(), 0U);
+  // The library's descriptor is the lowest free one, the one after the package's.
+  EXPECT_EQ(file.phone.events, Events({kSelf, SignEvent(file.fd() + 1)}));
+  EXPECT_EQ(file.log.records(),
+            Records({Starts(file.fd()), Info("VeltSignOat: Apk case.\n"), Finished()}));
+}
+
+TEST(VeltSignJni, TheDescriptorOfALibraryIsClosed) {
+  const ZipItem library = Library("lib/arm64-v8a/libfoo.so");
+  Opened file(SignPackage(WithLibraries({library})));
+  file.Install("lib/arm64/libfoo.so", library);
+  file.SignJni();
+  EXPECT_EQ(fcntl(file.fd() + 1, F_GETFD), -1);
+}
+
+TEST(VeltSignJni, APackageWithoutLibrariesSignsNothing) {
+  Opened file(SignPackage(WithLibraries({})));
+  EXPECT_EQ(file.SignJni(), 0U);
+  EXPECT_EQ(file.phone.events, Events());
+  EXPECT_EQ(file.log.records(), Records({Starts(file.fd()), Finished()}));
+}
+
+TEST(VeltSignJni, AnEntryOfNoRowIsPassedOverWithoutAMessage) {
+  const ZipItem library = Library("lib/x86/libfoo.so");
+  Opened file(SignPackage(WithLibraries({library})));
+  file.Install("lib/x86/libfoo.so", library);
+  EXPECT_EQ(file.SignJni(), 0U);
+  EXPECT_EQ(file.phone.events, Events());
+  EXPECT_EQ(file.log.records(), Records({Starts(file.fd()), Finished()}));
+}
+
+// Signs the entry when it lies at `installed`; true when the kernel was asked to sign it.
+bool IsFoundAt(const std::string& entry, const std::string& installed) {
+  const ZipItem library = Library(entry);
+  Opened file(SignPackage(WithLibraries({library})));
+  file.Install(installed, library);
+  file.SignJni();
+  return file.phone.events == Events({kSelf, SignEvent(file.fd() + 1)});
+}
+
+TEST(VeltSignJni, EveryRowOfTheDirectoryTableIsFoundInItsDirectoryAndNowhereElse) {
+  EXPECT_TRUE(IsFoundAt("lib/armeabi-v7a/libfoo.so", "lib/arm/libfoo.so"));
+  EXPECT_TRUE(IsFoundAt("lib/armeabi-v8a/libfoo.so", "lib/arm64/libfoo.so"));
+  EXPECT_TRUE(IsFoundAt("lib/arm64-v8a/libfoo.so", "lib/arm64/libfoo.so"));
+  EXPECT_TRUE(IsFoundAt("lib/armeabi/libfoo.so", "lib/arm/libfoo.so"));
+  EXPECT_FALSE(IsFoundAt("lib/armeabi-v7a/libfoo.so", "lib/arm64/libfoo.so"));
+  EXPECT_FALSE(IsFoundAt("lib/armeabi-v8a/libfoo.so", "lib/arm/libfoo.so"));
+  EXPECT_FALSE(IsFoundAt("lib/arm64-v8a/libfoo.so", "lib/arm/libfoo.so"));
+  EXPECT_FALSE(IsFoundAt("lib/armeabi/libfoo.so", "lib/armeabi/libfoo.so"));
+}
+
+TEST(VeltSignJni, TheDirectoryTableComparesPlainPrefixes) {
+  EXPECT_TRUE(IsFoundAt("lib/armeabi-v7aX/libfoo.so", "lib/armX/libfoo.so"));
+  EXPECT_TRUE(IsFoundAt("lib/armeabi-v9a/libfoo.so", "lib/arm-v9a/libfoo.so"));
+  EXPECT_TRUE(IsFoundAt("lib/arm64-v8a.so", "lib/arm64.so"));
+  EXPECT_FALSE(IsFoundAt("lib/arm64-v8/libfoo.so", "lib/arm64/libfoo.so"));
+}
+
+TEST(VeltSignJni, TwoAbisOfOneDirectoryAreBothSigned) {
+  const ZipItem first = Library("lib/armeabi-v7a/libfoo.so");
+  const ZipItem second = Library("lib/armeabi/libbar.so");
+  Opened file(SignPackage(WithLibraries({first, second})));
+  file.Install("lib/arm/libfoo.so", first);
+  file.Install("lib/arm/libbar.so", second);
+  file.SignJni();
+  const std::string event = SignEvent(file.fd() + 1);
+  EXPECT_EQ(file.phone.events, Events({kSelf, event, kSelf, event}));
+}
+
+TEST(VeltSignJni, APackagePathWithoutASlashLooksInTheWorkingDirectory) {
+  const ZipItem library = Library("lib/armeabi-v7a/libfoo.so");
+  TempDir temp;
+  const MemoryFile archive(SignPackage(WithLibraries({library})).Build());
+  WriteFile(temp.File("lib/arm/libfoo.so"), library.data);
+  ASSERT_EQ(chdir(temp.path().c_str()), 0);
+  LogCapture log;
+  Phone phone;
+  ApkTools::Apk apk(-1);
+  apk.Init(archive.fd(), "base.apk");
+  log.Clear();
+  EXPECT_EQ(VeltSignJni(apk, archive.fd(), "base.apk"), 0U);
+  EXPECT_EQ(phone.events, Events({kSelf, SignEvent(archive.fd() + 1)}));
+  ASSERT_EQ(chdir("/"), 0);
+  EXPECT_EQ(VeltSignJni(apk, archive.fd(), "base.apk"), 0U);
+  EXPECT_EQ(log.records()[log.records().size() - 2],
+            Error("VeltSignJni: File not verified: lib/arm/libfoo.so\n"));
+}
+
+TEST(VeltSignJni, APackageThatDidNotVerifySignsNoLibrary) {
+  Opened file(BadPackage());
+  file.Install("lib/arm64/libfoo.so", {"", ToBytes("\177ELF foo")});
+  EXPECT_EQ(file.SignJni(), kVeltFailure);
+  EXPECT_EQ(file.phone.events, Events());
+  EXPECT_EQ(
+      file.log.records(),
+      Records({Starts(file.fd()), Error("VeltSignJni: malformed apk: " + file.path() + "\n")}));
+}
+
+TEST(VeltSignJni, ALibraryWhoseBytesDifferIsNotSignedAndTheOthersAre) {
+  const ZipItem good = Library("lib/arm64-v8a/liba.so");
+  const ZipItem bad = Library("lib/arm64-v8a/libb.so");
+  Opened file(SignPackage(WithLibraries({good, bad})));
+  file.Install("lib/arm64/liba.so", good);
+  file.Install("lib/arm64/libb.so", {"", ToBytes("\177ELF other bytes")});
+  EXPECT_EQ(file.SignJni(), 0U);
+  EXPECT_EQ(file.phone.events, Events({kSelf, SignEvent(file.fd() + 1)}));
+  // The order of the two is the zip library's.
+  const LogRecord refused =
+      Error("VeltSignJni: File not verified: " + file.Path("lib/arm64/libb.so") + "\n");
+  const LogRecord signs = Info("VeltSignOat: Apk case.\n");
+  const Records& records = file.log.records();
+  EXPECT_TRUE(records == Records({Starts(file.fd()), signs, refused, Finished()}) ||
+              records == Records({Starts(file.fd()), refused, signs, Finished()}));
+}
+
+TEST(VeltSignJni, ALibraryThatIsNotOnDiskIsReportedTwice) {
+  Opened file(SignPackage(WithLibraries({Library("lib/arm64-v8a/libfoo.so")})));
+  EXPECT_EQ(file.SignJni(), 0U);
+  const std::string target = file.Path("lib/arm64/libfoo.so");
+  EXPECT_EQ(file.phone.events, Events());
+  EXPECT_EQ(file.log.records(),
+            Records({Starts(file.fd()), Error("Can't open file: " + target + "\n"),
+                     Error("VeltSignJni: File not verified: " + target + "\n"), Finished()}));
+}
+
+TEST(VeltSignJni, ALibraryThatTheManifestDoesNotListIsNotSigned) {
+  Package package = SignPackage(WithLibraries({}));
+  const ZipItem library = Library("lib/arm64-v8a/libfoo.so");
+  package.items.push_back(library);
+  Opened file(package);
+  file.Install("lib/arm64/libfoo.so", library);
+  EXPECT_EQ(file.SignJni(), 0U);
+  EXPECT_EQ(file.phone.events, Events());
+  EXPECT_EQ(
+      file.log.records(),
+      Records({Starts(file.fd()),
+               Error("Can't find file in META-INF/MANIFEST.MF: lib/arm64-v8a/libfoo.so\n"),
+               Error("VeltSignJni: File not verified: " + file.Path("lib/arm64/libfoo.so") + "\n"),
+               Finished()}));
+}
+
+TEST(VeltSignJni, ARefusalOfTheKernelDoesNotChangeTheResult) {
+  const ZipItem library = Library("lib/arm64-v8a/libfoo.so");
+  Opened file(SignPackage(WithLibraries({library})));
+  file.Install("lib/arm64/libfoo.so", library);
+  file.phone.sign_errno = EACCES;
+  EXPECT_EQ(file.SignJni(), 0U);
+  EXPECT_EQ(file.log.records(),
+            Records({Starts(file.fd()), Info("VeltSignOat: Apk case.\n"),
+                     Error("VELT can't sign a file (result=10000, errno 13: Permission denied).\n"),
+                     Finished()}));
+}
+
+// The file goes away between the check and the opening: the reading of the file is the only open
+// that succeeds.
+TEST(VeltSignJni, ALibraryThatCannotBeOpenedAfterItsCheckIsReportedWithItsErrno) {
+  const ZipItem library = Library("lib/arm64-v8a/libfoo.so");
+  Opened file(SignPackage(WithLibraries({library})));
+  file.Install("lib/arm64/libfoo.so", library);
+  file.phone.opens_before_failure = 1;
+  EXPECT_EQ(file.SignJni(), 0U);
+  EXPECT_EQ(file.phone.events, Events());
+  EXPECT_EQ(file.log.records(),
+            Records({Starts(file.fd()),
+                     Error("File " + file.Path("lib/arm64/libfoo.so") + " is not opened"),
+                     Error("Error 2: No such file or directory.\n"), Finished()}));
+}
+
+}  // namespace

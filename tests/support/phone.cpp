@@ -1,0 +1,136 @@
+#include "support/phone.h"
+
+#include <fcntl.h>
+#include <sys/types.h>
+#include <unistd.h>
+
+#include <algorithm>
+#include <cerrno>
+#include <cstdarg>
+#include <cstdio>
+#include <cstdlib>
+#include <cstring>
+
+#include "sign/libzu.h"
+
+namespace {
+
+Phone* phone = nullptr;
+
+bool IsIntegrityFile(const std::string& path) {
+  return path.rfind("/proc/", 0) == 0 && path.find("/integrity/value") != std::string::npos;
+}
+
+std::string NextIntegrity() {
+  const std::string text = phone->integrity.front();
+  if (phone->integrity.size() > 1) phone->integrity.pop_front();
+  return text;
+}
+
+int AnswerWith(int error) {
+  if (error == 0) return 0;
+  errno = error;
+  return -1;
+}
+
+int Sign(int fd, const uint8_t* payload) {
+  uint16_t length;
+  memcpy(&length, payload, sizeof(length));
+  phone->events.push_back("sign " + std::to_string(fd) + " " +
+                          Hex(payload, sizeof(length) + length));
+  return AnswerWith(phone->sign_errno);
+}
+
+int Verify(int fd) {
+  phone->events.push_back("verify " + std::to_string(fd));
+  return AnswerWith(phone->verify_errno);
+}
+
+}  // namespace
+
+Phone::Phone() { phone = this; }
+Phone::~Phone() { phone = nullptr; }
+
+std::string Hex(const void* data, size_t length) {
+  std::string text;
+  for (size_t i = 0; i < length; ++i) {
+    char digits[3];
+    snprintf(digits, sizeof(digits), "%02x", static_cast<const uint8_t*>(data)[i]);
+    text += digits;
+  }
+  return text;
+}
+
+extern "C" {
+
+int __real_open(const char* path, int flags, ...);
+FILE* __real_fopen(const char* path, const char* mode);
+int __real_fcntl(int fd, int command, ...);
+int __real_usleep(useconds_t microseconds);
+ssize_t __real_fgetxattr(int fd, const char* name, void* value, size_t size);
+ssize_t __real_readlink(const char* path, char* buffer, size_t size);
+
+// Nothing that is linked with a Phone makes files by open(), so there is no mode to pass on.
+int __wrap_open(const char* path, int flags, ...) {
+  if (phone == nullptr || phone->opens_before_failure < 0) return __real_open(path, flags);
+  if (phone->opens_before_failure-- > 0) return __real_open(path, flags);
+  phone->opens_before_failure = 0;
+  errno = ENOENT;
+  return -1;
+}
+
+FILE* __wrap_fopen(const char* path, const char* mode) {
+  if (phone == nullptr || !IsIntegrityFile(path)) return __real_fopen(path, mode);
+  phone->events.push_back(std::string("integrity ") + path);
+  if (!phone->has_integrity_file) {
+    errno = ENOENT;
+    return nullptr;
+  }
+  const std::string text = NextIntegrity();
+  FILE* file = tmpfile();
+  if (file == nullptr) abort();
+  fwrite(text.data(), 1, text.size(), file);
+  rewind(file);
+  return file;
+}
+
+int __wrap_fcntl(int fd, int command, ...) {
+  if (phone != nullptr && command == 1125) return Verify(fd);
+  va_list arguments;
+  va_start(arguments, command);
+  void* argument = va_arg(arguments, void*);
+  va_end(arguments);
+  if (phone == nullptr || command != 1124) return __real_fcntl(fd, command, argument);
+  return Sign(fd, static_cast<const uint8_t*>(argument));
+}
+
+int __wrap_usleep(useconds_t microseconds) {
+  if (phone == nullptr) return __real_usleep(microseconds);
+  phone->events.push_back("sleep " + std::to_string(microseconds));
+  return 0;
+}
+
+ssize_t __wrap_fgetxattr(int fd, const char* name, void* value, size_t size) {
+  if (phone == nullptr || strcmp(name, "user.zu") != 0 || phone->zu_attribute_size < 0) {
+    return __real_fgetxattr(fd, name, value, size);
+  }
+  return phone->zu_attribute_size;
+}
+
+ssize_t __wrap_readlink(const char* path, char* buffer, size_t size) {
+  const auto names = [path](int fd) { return path == "/proc/self/fd/" + std::to_string(fd); };
+  if (phone != nullptr &&
+      std::any_of(phone->nameless_fds.begin(), phone->nameless_fds.end(), names)) {
+    errno = ENOENT;
+    return -1;
+  }
+  return __real_readlink(path, buffer, size);
+}
+
+int ZuNewCertificate(int fd, const char* name, const unsigned char* data, size_t length) {
+  if (phone == nullptr) return -1;
+  phone->events.push_back("register " + std::to_string(fd) + " " + name + " " + Hex(data, length));
+  return phone->zu_result;
+}
+
+}  // extern "C"

@@ -1,0 +1,41 @@
+// What only the phone has, inside the test program: the kernel's integrity feature and libzu.
+//
+// A program that links this file and asks the linker to wrap open, fcntl, fopen, usleep, fgetxattr
+// and readlink (target `phone` does) has a Phone to set up and to read afterwards. Without a living
+// Phone every wrapped call goes to the real system, and libzu refuses.
+#pragma once
+
+#include <cstdint>
+#include <deque>
+#include <map>
+#include <string>
+#include <vector>
+
+struct Phone {
+  Phone();
+  ~Phone();
+  Phone(const Phone&) = delete;
+  Phone& operator=(const Phone&) = delete;
+
+  // A healthy phone, to be changed by the test.
+  std::deque<std::string> integrity = {"1f\n"};  // file contents, one an opening; the last repeats
+  bool has_integrity_file = true;
+  int sign_errno = 0;             // 0: the kernel signs
+  int verify_errno = 0;           // 0: the kernel trusts every file
+  int zu_result = 0;              // what libzu answers
+  int zu_attribute_size = -1;     // of "user.zu", on every file; -1: there is none
+  std::vector<int> nameless_fds;  // descriptors whose path cannot be resolved
+  int opens_before_failure =
+      -1;  // open() succeeds so many times and then finds no file; -1: always
+
+  // What the code under test did, in the order in which it did it: "integrity PATH", "sleep
+  // MICROSECONDS", "sign FD PAYLOAD-HEX", "verify FD", "register FD NAME DATA-HEX".
+  std::vector<std::string> events;
+};
+
+// The bytes as lower-case hexadecimal digits.
+std::string Hex(const void* data, size_t length);
+template <class Bytes>
+std::string Hex(const Bytes& bytes) {
+  return Hex(bytes.data(), bytes.size());
+}
