@@ -1,1 +1,419 @@
 #include "apk/manifest_mf.h"
+
+#include <gtest/gtest.h>
+
+#include <algorithm>
+#include <cstdlib>
+#include <filesystem>
+#include <fstream>
+#include <iterator>
+#include <random>
+#include <string>
+#include <vector>
+
+#include "support/log_capture.h"
+
+// Steps a parser whose state is none of its states.
+class ManifestMfPeer {
+ public:
+  static bool StepInState(int state) {
+    ManifestMf manifest;
+    ManifestMf::Progress at;
+    at.state = static_cast<ManifestMf::State>(state);
+    return manifest.step(at);
+  }
+};
+
+namespace {
+
+using Section = ManifestMf::Section;
+using Sections = std::vector<Section>;
+
+// The text of a string literal, NULs included.
+template <size_t n>
+std::string Text(const char (&literal)[n]) {
+  return std::string(literal, n - 1);
+}
+
+// The sections of `text`, which parses without a message.
+Sections Parse(const std::string& text) {
+  LogCapture log;
+  ManifestMf manifest;
+  EXPECT_TRUE(manifest.load(text));
+  EXPECT_TRUE(static_cast<bool>(manifest));
+  EXPECT_EQ(Records(), log.records());
+  return manifest.getSections();
+}
+
+// `text` does not parse, `message` says why, and `sections` ended before the fault.
+void ExpectFault(const std::string& text, const std::string& message,
+                 const Sections& sections = {}) {
+  LogCapture log;
+  ManifestMf manifest;
+  EXPECT_FALSE(manifest.load(text));
+  EXPECT_FALSE(static_cast<bool>(manifest));
+  EXPECT_EQ(Records({Error(message)}), log.records());
+  EXPECT_EQ(sections, manifest.getSections());
+}
+
+void ExpectNoColon(const std::string& text, const std::string& name,
+                   const Sections& sections = {}) {
+  ExpectFault(text,
+              "Parse manifest: Error: P_KEY: unexpected end of file after key '" + name + "'\n",
+              sections);
+}
+
+TEST(ManifestMf, FreshObjectIsInvalidAndEmpty) {
+  const ManifestMf manifest;
+  EXPECT_FALSE(static_cast<bool>(manifest));
+  EXPECT_TRUE(manifest.getSections().empty());
+}
+
+TEST(ManifestMf, LoadStartsFromScratch) {
+  ManifestMf manifest;
+  EXPECT_TRUE(manifest.load("A: 1\r\n\r\n"));
+  EXPECT_TRUE(manifest.load("B: 2\r\n\r\n"));
+  EXPECT_EQ(Sections({{{"B", "2"}}}), manifest.getSections());
+  EXPECT_FALSE(manifest.load("Key:x"));
+  EXPECT_FALSE(static_cast<bool>(manifest));
+  EXPECT_TRUE(manifest.getSections().empty());
+  EXPECT_TRUE(manifest.load("A: 1\r\n\r\n"));
+  EXPECT_TRUE(static_cast<bool>(manifest));
+  EXPECT_EQ(Sections({{{"A", "1"}}}), manifest.getSections());
+}
+
+TEST(ManifestMf, EmptyTextHasNoSections) { EXPECT_EQ(Sections(), Parse("")); }
+
+TEST(ManifestMf, LineBreaksAndSpacesAloneHaveNoSections) {
+  EXPECT_EQ(Sections(), Parse("\r\n \n\r   \r\r\n\n "));
+}
+
+TEST(ManifestMf, EmptyLineEndsTheSection) {
+  EXPECT_EQ(Sections({{{"Manifest-Version", "1.0"}}}), Parse("Manifest-Version: 1.0\r\n\r\n"));
+}
+
+TEST(ManifestMf, SectionWithoutTheFinalEmptyLineIsDropped) {
+  EXPECT_EQ(Sections(), Parse("Manifest-Version: 1.0\r\n"));
+  EXPECT_EQ(Sections(), Parse("Manifest-Version: 1.0"));
+  EXPECT_EQ(Sections({{{"A", "1"}}}), Parse("A: 1\r\n\r\nName: x\r\nSHA1-Digest: y\r\n"));
+}
+
+TEST(ManifestMf, SectionsKeepTheOrderOfTheText) {
+  EXPECT_EQ(Sections({{{"A", "1"}}, {{"Name", "z"}, {"B", "2"}}, {{"Name", "a"}}}),
+            Parse("A: 1\r\n\r\nName: z\r\nB: 2\r\n\r\nName: a\r\n\r\n"));
+}
+
+TEST(ManifestMf, AttributesOfASectionAreInByteOrderOfTheirNames) {
+  const Sections sections = Parse("b: 1\r\nab: 2\r\n\xC3\xA4: 3\r\na: 4\r\nB: 5\r\na-: 6\r\n\r\n");
+  ASSERT_EQ(1U, sections.size());
+  std::vector<std::string> names;
+  for (const auto& [name, value] : sections[0]) names.push_back(name);
+  EXPECT_EQ(std::vector<std::string>({"B", "a", "a-", "ab", "b", "\xC3\xA4"}), names);
+}
+
+TEST(ManifestMf, LaterOfTwoEqualNamesWins) {
+  EXPECT_EQ(Sections({{{"A", "2"}}}), Parse("A: 1\r\nA: 2\r\n\r\n"));
+}
+
+TEST(ManifestMf, NamesThatDifferInCaseAreTwo) {
+  EXPECT_EQ(Sections({{{"A", "1"}, {"a", "2"}}}), Parse("A: 1\r\na: 2\r\n\r\n"));
+}
+
+TEST(ManifestMf, EqualNamesInTwoSectionsAreTwo) {
+  EXPECT_EQ(Sections({{{"A", "1"}}, {{"A", "2"}}}), Parse("A: 1\r\n\r\nA: 2\r\n\r\n"));
+}
+
+TEST(ManifestMf, LineThatBeginsWithASpaceContinuesTheValue) {
+  EXPECT_EQ(Sections({{{"Name", "lib/x.soSHA1-Digest: q"}}}),
+            Parse("Name: lib/x.so\r\n SHA1-Digest: q\r\n\r\n"));
+}
+
+TEST(ManifestMf, SeveralLinesContinueAValue) {
+  EXPECT_EQ(Sections({{{"A", "onetwo three"}, {"B", "2"}}}),
+            Parse("A: one\r\n two\r\n  three\r\n \r\nB: 2\r\n\r\n"));
+}
+
+TEST(ManifestMf, ContinuationReachesTheValueOfALineWithoutOne) {
+  EXPECT_EQ(Sections({{{"Key", "value"}}}), Parse("Key:\r\n value\r\n\r\n"));
+}
+
+TEST(ManifestMf, OnlyOneSpaceAfterTheColonIsDropped) {
+  EXPECT_EQ(Sections({{{"Key", " two spaces"}}}), Parse("Key:  two spaces\r\n\r\n"));
+}
+
+TEST(ManifestMf, SpacesAtTheEndOfAValueStay) {
+  EXPECT_EQ(Sections({{{"Key", "v  "}}}), Parse("Key: v  \r\n\r\n"));
+}
+
+TEST(ManifestMf, SpacesAroundANameStay) {
+  EXPECT_EQ(Sections({{{"A ", "1"}, {"B\t", "2"}}}), Parse("A : 1\r\nB\t: 2\r\n\r\n"));
+}
+
+TEST(ManifestMf, ColonsInAValueBelongToIt) {
+  EXPECT_EQ(Sections({{{"A", "1: 2:x"}}}), Parse("A: 1: 2:x\r\n\r\n"));
+}
+
+TEST(ManifestMf, LinesMayHaveAnyLength) {
+  const std::string name(5000, 'n');
+  const std::string value(70000, 'v');
+  EXPECT_EQ(Sections({{{name, value}}}), Parse(name + ": " + value + "\r\n\r\n"));
+}
+
+TEST(ManifestMf, BytesAboveAsciiAreTakenAsTheyAre) {
+  EXPECT_EQ(Sections({{{"\xFF\x80", "\xC3\xA4\x01"}}}), Parse("\xFF\x80: \xC3\xA4\x01\r\n\r\n"));
+}
+
+TEST(ManifestMf, AnyOtherByteAfterAColonFails) {
+  ExpectFault("Key:x", "Parse manifest: Error: P_COLON: unexpected 0x78 after colon: x\n");
+  ExpectFault("Key:\tx\r\n\r\n",
+              "Parse manifest: Error: P_COLON: unexpected 0x09 after colon: \t\n");
+}
+
+// The record ends where the NUL that stands for the missing byte is printed.
+TEST(ManifestMf, ColonAtTheEndOfTheTextFails) {
+  ExpectFault("Key:", "Parse manifest: Error: P_COLON: unexpected 0x00 after colon: ");
+}
+
+TEST(ManifestMf, NulAfterAColonFails) {
+  ExpectFault(Text("Key:\0 v\r\n\r\n"),
+              "Parse manifest: Error: P_COLON: unexpected 0x00 after colon: ");
+}
+
+TEST(ManifestMf, ByteAfterAColonIsReportedAsUnsigned) {
+  ExpectFault("Key:\xFF", "Parse manifest: Error: P_COLON: unexpected 0xff after colon: \xFF\n");
+}
+
+TEST(ManifestMf, NameThatRunsIntoTheEndOfTheTextFails) {
+  ExpectNoColon("NoColonHere", "NoColonHere");
+  ExpectNoColon("A: 1\r\nNoColonHere\r\n", "NoColonHere\r\n");
+}
+
+TEST(ManifestMf, NameThatRunsIntoANulFails) {
+  ExpectNoColon(Text("Na\0me: v\r\n\r\n"), "Na");
+  ExpectNoColon(Text("\0Name: v\r\n\r\n"), "");
+  ExpectNoColon(Text("A: 1\r\n\0B: 2\r\n\r\n"), "");
+}
+
+TEST(ManifestMf, LineWithoutAColonIsTheFrontPartOfTheNextName) {
+  EXPECT_EQ(Sections({{{"Bad line\r\nKey", "v"}}}), Parse("Bad line\r\nKey: v\r\n\r\n"));
+}
+
+TEST(ManifestMf, EmptyLineWithinANameDoesNotEndTheSection) {
+  EXPECT_EQ(Sections({{{"A", "1"}, {"Bad\r\n\r\nName", "v"}}}),
+            Parse("A: 1\r\nBad\r\n\r\nName: v\r\n\r\n"));
+}
+
+TEST(ManifestMf, SectionsBeforeAFaultStay) {
+  ExpectFault("A: 1\r\n\r\nB: 2\r\nKey:x",
+              "Parse manifest: Error: P_COLON: unexpected 0x78 after colon: x\n", {{{"A", "1"}}});
+  ExpectNoColon("A: 1\r\n\r\nB", "B", {{{"A", "1"}}});
+}
+
+TEST(ManifestMf, PairWithoutAValueIsDropped) {
+  EXPECT_EQ(Sections({{{"A", "1"}}}), Parse("Created-By:\r\nA: 1\r\n\r\n"));
+  EXPECT_EQ(Sections({{{"A", "1"}}}), Parse("Created-By: \r\nA: 1\r\n\r\n"));
+}
+
+TEST(ManifestMf, PairWithoutANameIsDropped) {
+  EXPECT_EQ(Sections({{{"A", "1"}}}), Parse(": v\r\nA: 1\r\n\r\n"));
+}
+
+TEST(ManifestMf, EmptyValueDoesNotReplaceAnEarlierOne) {
+  EXPECT_EQ(Sections({{{"A", "1"}}}), Parse("A: 1\r\nA:\r\n\r\n"));
+}
+
+TEST(ManifestMf, SectionThatEndedUpEmptyCounts) {
+  EXPECT_EQ(Sections({{}}), Parse("Key:\r\n\r\n"));
+  EXPECT_EQ(Sections({{}, {{"A", "1"}}}), Parse("Key:\r\n\r\nA: 1\r\n\r\n"));
+}
+
+TEST(ManifestMf, FurtherEmptyLinesAndSpacesBetweenSectionsAreSkipped) {
+  EXPECT_EQ(Sections({{{"A", "1"}}, {{"B", "2"}}}),
+            Parse("\r\n A: 1\r\n\r\n\r\n  \r\n \n\rB: 2\r\n\r\n"));
+}
+
+TEST(ManifestMf, LoneLineFeedAfterAColonLosesTheFirstByteOfTheNextName) {
+  EXPECT_EQ(Sections({{{"ame", "x"}}}), Parse("A:\nName: x\n\n"));
+}
+
+TEST(ManifestMf, LoneCarriageReturnAfterAColonLosesTheFirstByteOfTheNextName) {
+  EXPECT_EQ(Sections({{{"ame", "x"}}}), Parse("A:\rName: x\r\r"));
+}
+
+TEST(ManifestMf, LoneLineFeedAfterAValueLosesNothing) {
+  EXPECT_EQ(Sections({{{"A", "1"}, {"Name", "x"}}}), Parse("A: 1\nName: x\n\n"));
+}
+
+// The second LF is taken for the line break, and "Name" follows in the same section.
+TEST(ManifestMf, EmptyLineAfterAColonAndALoneLineFeedIsNotSeen) {
+  EXPECT_EQ(Sections({{{"B", "1"}, {"Name", "x"}}}), Parse("B: 1\nA:\n\nName: x\n\n"));
+}
+
+// The space is taken for the line break, and "value" begins a name.
+TEST(ManifestMf, ContinuationAfterAColonAndALoneLineFeedIsAName) {
+  EXPECT_EQ(Sections({{{"value\nName", "x"}}}), Parse("A:\n value\nName: x\n\n"));
+}
+
+// The first byte of the next line and a CR or LF behind it are one line break together.
+TEST(ManifestMf, OneByteLineAfterAColonAndALoneLineFeedIsLostWithItsLineBreak) {
+  EXPECT_EQ(Sections({{{"Name", "x"}}}), Parse("A:\nN\nName: x\n\n"));
+}
+
+TEST(ManifestMf, LineFeedAfterAColonAtTheEndOfTheTextSucceeds) {
+  EXPECT_EQ(Sections(), Parse("A:\n"));
+  EXPECT_EQ(Sections(), Parse("A:\r"));
+  EXPECT_EQ(Sections(), Parse("A: "));
+}
+
+TEST(ManifestMf, EveryKindOfLineBreakEndsLinesAndSections) {
+  for (const std::string eol : {"\r\n", "\n\r", "\n", "\r"}) {
+    EXPECT_EQ(Sections({{{"A", "1x"}, {"B", "2"}}, {{"C", "3"}}}),
+              Parse("A: 1" + eol + " x" + eol + "B: 2" + eol + eol + "C: 3" + eol + eol))
+        << testing::PrintToString(eol);
+  }
+}
+
+TEST(ManifestMf, LineFeedAndCrLfAfterAValueAreALineBreakAndAnEmptyLine) {
+  EXPECT_EQ(Sections({{{"A", "1"}}, {{"B", "2"}}}), Parse("A: 1\n\r\nB: 2\n\r\n"));
+}
+
+TEST(ManifestMf, CarriageReturnAndCrLfAfterAValueAreALineBreakAndAnEmptyLine) {
+  EXPECT_EQ(Sections({{{"A", "1"}}, {{"B", "2"}}}), Parse("A: 1\r\r\nB: 2\r\r\n"));
+}
+
+TEST(ManifestMf, TabAfterAnEmptyLineStartsAName) {
+  EXPECT_EQ(Sections({{{"A", "1"}}, {{"\tB", "2"}}}), Parse("A: 1\r\n\r\n\tB: 2\r\n\r\n"));
+}
+
+TEST(ManifestMf, TabAtTheStartOfALineStartsAName) {
+  EXPECT_EQ(Sections({{{"A", "1"}, {"\tB", "2"}}}), Parse("A: 1\r\n\tB: 2\r\n\r\n"));
+}
+
+TEST(ManifestMf, NulInAValueIsALineBreak) {
+  EXPECT_EQ(Sections({{{"A", "1"}, {"B", "2"}}}), Parse(Text("A: 1\0B: 2\r\n\r\n")));
+  EXPECT_EQ(Sections({{{"A", "12"}}}), Parse(Text("A: 1\0 2\r\n\r\n")));
+}
+
+// NUL CR and NUL LF are one line break, as CR LF is; the second of two NULs starts a name.
+TEST(ManifestMf, NulAndTheLineBreakByteBehindItAreOneLineBreak) {
+  EXPECT_EQ(Sections({{{"A", "1"}, {"B", "2"}}}), Parse(Text("A: 1\0\nB: 2\r\n\r\n")));
+  EXPECT_EQ(Sections({{{"A", "1"}}, {{"B", "2"}}}), Parse(Text("A: 1\0\r\nB: 2\r\n\r\n")));
+  ExpectNoColon(Text("A: 1\0\0B: 2\r\n\r\n"), "");
+}
+
+TEST(ManifestMf, NulAtTheEndOfTheTextEndsAValueOnly) {
+  EXPECT_EQ(Sections({{{"A", "1"}}}), Parse(Text("A: 1\r\n\r\nB: 2\0")));
+  ExpectNoColon(Text("A: 1\r\n\r\n\0"), "", {{{"A", "1"}}});
+}
+
+TEST(ManifestMf, UnexpectedStateFails) {
+  LogCapture log;
+  EXPECT_FALSE(ManifestMfPeer::StepInState(6));
+  EXPECT_EQ(Records({Error("Parse manifest: Unexpected state.\n")}), log.records());
+}
+
+// Whatever is cut off, the parser ends, and finds no more sections than in the whole.
+TEST(ManifestMf, EveryPrefixOfAManifestEnds) {
+  LogCapture log;
+  const std::string text = "A: 1\r\n 2\r\n\r\nB:\nC: 3\n\nD:\r\n v\r\r";
+  const Sections whole = Parse(text);
+  for (size_t length = 0; length < text.size(); ++length) {
+    ManifestMf manifest;
+    manifest.load(text.substr(0, length));
+    const Sections& sections = manifest.getSections();
+    ASSERT_LE(sections.size(), whole.size());
+    EXPECT_TRUE(std::equal(sections.begin(), sections.end(), whole.begin())) << length;
+  }
+}
+
+// Below, the JDK's parser is asked about manifests as tools write them.
+
+std::string ReadText(const std::string& path) {
+  std::ifstream file(path, std::ios::binary);
+  return {std::istreambuf_iterator<char>(file), {}};
+}
+
+// A line as the JAR File Specification has it: at most 72 bytes, continued after a space.
+std::string Line(const std::string& name, const std::string& value) {
+  std::string line = name + ": " + value;
+  std::string text;
+  while (line.size() > 72) {
+    text += line.substr(0, 72) + "\r\n";
+    line = " " + line.substr(72);
+  }
+  return text + line + "\r\n";
+}
+
+class ManifestWriter {
+ public:
+  explicit ManifestWriter(uint32_t seed) : random_(seed) {}
+
+  std::string Write() {
+    std::string text = Line("Manifest-Version", "1.0") + Attributes() + "\r\n";
+    const uint32_t sections = Pick(20);
+    for (uint32_t i = 0; i < sections; ++i) {
+      // The letters of two bytes are torn apart where a line is continued.
+      const std::string name = "assets/\xC3\xA4\xE2\x82\xAC" + std::to_string(i) + Value();
+      text += Line("Name", name) + Attributes() + "\r\n";
+    }
+    return text;
+  }
+
+ private:
+  uint32_t Pick(uint32_t below) { return static_cast<uint32_t>(random_() % below); }
+
+  std::string Attributes() {
+    std::string text;
+    const uint32_t count = Pick(6);
+    for (uint32_t i = 0; i < count; ++i) {
+      text += Line("Attribute-" + std::to_string(i) + std::string(Pick(50), '_'), Value());
+    }
+    return text;
+  }
+
+  std::string Value() {
+    const std::string pieces[] = {"a", " ", ":", "=", "Z9+/", "\xC3\xA4", ": ", "\t"};
+    std::string value = "v";
+    for (uint32_t i = Pick(4) == 0 ? Pick(200) : Pick(20); i > 0; --i) value += pieces[Pick(8)];
+    return value;
+  }
+
+  std::mt19937 random_;
+};
+
+// What DumpManifest.java would say of `sections`.
+std::string Dump(const Sections& sections) {
+  std::vector<std::string> entries;
+  for (const Section& section : sections) {
+    const auto name = section.find("Name");
+    std::string entry = "Section " + (name == section.end() ? "" : name->second) + "\n";
+    for (const auto& [key, value] : section) {
+      if (key != "Name") entry += key + ": " + value + "\n";
+    }
+    entries.push_back(entry);
+  }
+  std::sort(entries.begin(), entries.end());
+  std::string text;
+  for (const std::string& entry : entries) text += entry;
+  return text;
+}
+
+TEST(ManifestMf, AgreesWithTheJdkOnWellFormedManifests) {
+  constexpr uint32_t kCount = 200;
+  std::string directory = testing::TempDir() + "manifest_mf_test.XXXXXX";
+  ASSERT_NE(nullptr, mkdtemp(directory.data()));
+  const auto path = [&](uint32_t i) { return directory + "/" + std::to_string(i) + ".mf"; };
+  for (uint32_t i = 0; i < kCount; ++i) {
+    std::ofstream(path(i), std::ios::binary) << ManifestWriter(i).Write();
+  }
+  const auto program = std::filesystem::path(__FILE__).replace_filename("DumpManifest.java");
+  ASSERT_EQ(0, std::system(("java " + program.string() + " " + directory).c_str()));
+  for (uint32_t i = 0; i < kCount; ++i) {
+    const std::string expected = ReadText(path(i) + ".dump");
+    EXPECT_EQ(expected, Dump(Parse(ReadText(path(i))))) << "manifest " << i;
+    EXPECT_EQ(expected, Dump(Parse(ReadText(path(i) + ".rewritten")))) << "rewritten " << i;
+  }
+  std::filesystem::remove_all(directory);
+}
+
+}  // namespace
