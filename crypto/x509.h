@@ -1,4 +1,6 @@
-// One X.509 certificate (RFC 5280), read into a record that points into the caller's bytes.
+// One X.509 certificate (RFC 5280 §4.1), read into a record that points into the caller's bytes.
+// Its structure is read and nothing more: dates, signatures and chains are for others to check. No
+// allocation, no logging; the caller's bytes must outlive the record.
 #pragma once
 
 #include <cstddef>
@@ -6,55 +8,95 @@
 
 #include "crypto/asn1.h"
 
+// A UTCTime or GeneralizedTime as written, its numbers in no way checked; `year` has four digits.
 struct x509_parser_time {
   uint16_t year;
   uint8_t month, day, hour, minute, second;
 };
 
+// The attributes of a name that are kept, by x509_name_attribute::type.
+enum : uint32_t {
+  kX509DomainComponent = 1,
+  kX509CommonName = 2,
+  kX509CountryName = 3,
+  kX509LocalityName = 4,
+  kX509StateOrProvinceName = 5,
+  kX509OrganizationName = 6,
+  kX509OrganizationalUnitName = 7,
+  kX509UserId = 8,
+};
+
 struct x509_name_attribute {
   uint32_t type;
-  const uint8_t* value;
+  const uint8_t* value;  // not NUL-terminated, and free of NUL bytes
   uint64_t value_length;
 };
 
+inline constexpr size_t kX509MaxAttributes = 20;
+
+// A distinguished name, with the alternative names that an extension gives for it. What the
+// certificate does not hold is null and 0; of several of a kind, the last one counts.
 struct x509_name {
-  x509_name_attribute attributes[20];
+  x509_name_attribute attributes[kX509MaxAttributes];  // in order of appearance
   uint64_t attribute_count;
-  const uint8_t* email;
+  const uint8_t* email;  // the emailAddress attribute, which is not among `attributes`
   uint64_t email_length;
-  const uint8_t* alt_email;
+  const uint8_t* alt_email;  // rfc822Name
   uint64_t alt_email_length;
-  const uint8_t* dns;
+  const uint8_t* dns;  // dNSName
   uint64_t dns_length;
-  const uint8_t* uri;
+  const uint8_t* uri;  // uniformResourceIdentifier
   uint64_t uri_length;
-  const uint8_t* ip;
+  const uint8_t* ip;  // iPAddress, network byte order
   uint64_t ip_length;
-  asn1_oid rid;
+  asn1_oid rid;  // registeredID
 };
 
+// x509_certificate::extensions_present
+inline constexpr uint32_t kX509BasicConstraints = 1;
+inline constexpr uint32_t kX509PathLenConstraint = 2;
+inline constexpr uint32_t kX509KeyUsage = 4;
+inline constexpr uint32_t kX509SubjectAltName = 8;
+inline constexpr uint32_t kX509IssuerAltName = 16;
+
 struct x509_certificate {
-  x509_certificate* next;
-  uint32_t version;
-  uint32_t serial_number;
-  asn1_oid signature_oid, signature_params_oid;
+  x509_certificate* next;                        // for chains of records; left null
+  uint32_t version;                              // 0 = v1, 1 = v2, 2 = v3
+  uint32_t serial_number;                        // the low 32 bits
+  asn1_oid signature_oid, signature_params_oid;  // of the tbsCertificate; parameters if an OID
   x509_name issuer;
   x509_name subject;
   x509_parser_time not_before, not_after;
   asn1_oid public_key_oid, public_key_params_oid;
-  const uint8_t* public_key;
+  const uint8_t* public_key;  // the BIT STRING after its count of unused bits
   uint64_t public_key_length;
-  asn1_oid signature_algorithm_oid, signature_algorithm_params_oid;
-  const uint8_t* signature_value;
+  asn1_oid signature_algorithm_oid, signature_algorithm_params_oid;  // of the Certificate
+  const uint8_t* signature_value;  // the BIT STRING after its count of unused bits
   uint64_t signature_value_length;
-  uint32_t extensions_present;
-  uint32_t ca;
-  uint32_t path_len_constraint;
-  uint32_t key_usage;
-  const uint8_t* cert_start;
+  uint32_t extensions_present;   // kX509BasicConstraints and so on
+  uint32_t ca;                   // the BOOLEAN's byte: 0xFF for TRUE in DER
+  uint32_t path_len_constraint;  // the low 32 bits
+  uint32_t key_usage;            // RFC 5280 §4.2.1.3, digitalSignature in bit 0
+  const uint8_t* cert_start;     // the Certificate, header included
   uint64_t cert_length;
-  const uint8_t* tbs_start;
+  const uint8_t* tbs_start;  // the tbsCertificate, header included
   uint64_t tbs_length;
 };
 
+// Reads the certificate at the start of the `len` bytes at `buf` into `cert`; what follows it is
+// not looked at. Returns 0, or
+//   -2   nothing given: `buf` or `cert` is null, or `len` 0
+//   -3   the Certificate or the tbsCertificate is not a SEQUENCE
+//   -4   the signatureValue is not a BIT STRING
+//   -5   a header of the version, the serialNumber or the optional fields cannot be read, the
+//        optional fields are of another class than context-specific, or the signatureValue is empty
+//   -6   the signatureValue does not end with a whole byte
+//   -9   the version is none of v1, v2 and v3
+//   -10  the serialNumber is not an INTEGER
+//   -11  a signature's AlgorithmIdentifier is malformed
+//   -12  the issuer or the subject is
+//   -13  the validity is
+//   -14  the subjectPublicKeyInfo is
+//   -15  an extension is, or is critical and not understood, or stands in a v2 certificate
+// After a failure `cert`, if not null, holds what was read before it.
 int x509_certificate_parse(const uint8_t* buf, size_t len, x509_certificate* cert);
