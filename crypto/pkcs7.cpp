@@ -1,1 +1,207 @@
 #include "crypto/pkcs7.h"
+
+#include <algorithm>
+#include <cstdarg>
+#include <cstddef>
+#include <cstdio>
+#include <cstring>
+
+#include "crypto/asn1.h"
+#include "crypto/x509.h"
+
+namespace {
+
+// The block, and places in it: offsets from its start, which may lie beyond its end.
+struct Block {
+  const uint8_t* bytes;
+  size_t length;
+
+  // Reads the header at `offset`. The header itself must lie within the block; the element's length
+  // is compared with what `bound` bytes from `offset` on would leave for it.
+  bool Read(size_t offset, size_t bound, asn1_hdr* hdr) const;
+  // Reads the header at `offset` of an element that ends at `end`, which lies in the block, or
+  // before.
+  bool ReadInside(size_t offset, size_t end, asn1_hdr* hdr) const;
+  // Where an element's contents start, and where they end.
+  size_t Enter(const asn1_hdr& hdr) const { return static_cast<size_t>(hdr.payload - bytes); }
+  size_t Skip(const asn1_hdr& hdr) const { return Enter(hdr) + hdr.length; }
+};
+
+bool ReadHeaders(const Block& block, asn1_hdr* hdr);
+bool ReadCertificate(const Block& block, const asn1_hdr& certificates,
+                     x509_certificate* certificate, pkcs7* record);
+bool ReadPublicKey(const Block& block, const x509_certificate& certificate, pkcs7* record);
+void StoreExponent(const asn1_hdr& exponent, pkcs7* record);
+bool ReadSigner(const Block& block, const asn1_hdr& certificates, pkcs7* record);
+bool ReadDigestAlgorithm(const Block& block, size_t offset, size_t end, asn1_hdr* algorithm);
+
+// Tells of a failure on a line of its own; returns false.
+bool Fail(const char* format, ...) __attribute__((format(printf, 1, 2)));
+
+constexpr char kUnreadable[] = "PUBLIC KEY ERROR: reading asn1 tag fail";
+constexpr char kNotAnInteger[] = "PUBLIC KEY ERROR: processing INTEGER tag fail";
+
+}  // namespace
+
+int processCert(const uint8_t* block, uint32_t length, pkcs7* record) {
+  const Block whole = {block, length};
+  asn1_hdr certificates;
+  if (!ReadHeaders(whole, &certificates)) {
+    Fail("processPKCS7Header() error");
+    return 1;
+  }
+  x509_certificate certificate;
+  if (!ReadCertificate(whole, certificates, &certificate, record)) return 1;
+  if (!ReadPublicKey(whole, certificate, record)) {
+    Fail("processPublicKey() error");
+    return 1;
+  }
+  if (!ReadSigner(whole, certificates, record)) {
+    Fail("processSignHeader() error");
+    return 1;
+  }
+  return 0;
+}
+
+namespace {
+
+bool Block::Read(size_t offset, size_t bound, asn1_hdr* hdr) const {
+  *hdr = {};
+  if (offset > length) return false;
+  return asn1_get_next_bounded(bytes + offset, length - offset, bound, hdr) == 0;
+}
+
+bool Block::ReadInside(size_t offset, size_t end, asn1_hdr* hdr) const {
+  return offset <= end && asn1_get_next(bytes + offset, end - offset, hdr) == 0;
+}
+
+// Goes from the start of the block to the [0] of its certificates, whose header it leaves in `hdr`.
+// Deliberate: no label is looked at, and each length is compared with the whole block's, from
+// wherever the element is.
+bool ReadHeaders(const Block& block, asn1_hdr* hdr) {
+  if (!block.Read(0, block.length, hdr) || !block.Read(block.Enter(*hdr), block.length, hdr)) {
+    return Fail("CANT PROCESS CERTIFICATE TAG");
+  }
+
+  constexpr size_t (Block::*kMoves[])(const asn1_hdr&) const = {
+      &Block::Skip,   // over the contentType, to the [0] of the content
+      &Block::Enter,  // to the SignedData
+      &Block::Enter,  // to its version
+      &Block::Skip,   // to the digestAlgorithms
+      &Block::Skip,   // to the contentInfo
+      &Block::Skip,   // to the [0] of the certificates
+  };
+  for (const auto move : kMoves) {
+    if (block.Read((block.*move)(*hdr), block.length, hdr)) continue;
+    // Deliberate: a header that could not be read has no place, so the offset printed is the
+    // distance from the block to the null address.
+    const uintptr_t offset =
+        reinterpret_cast<uintptr_t>(hdr->payload) - reinterpret_cast<uintptr_t>(block.bytes);
+    return Fail("CANT PROCESS CERTIFICATE TAG = %d, offset = %p", static_cast<int>(hdr->tag),
+                reinterpret_cast<void*>(offset));
+  }
+  return true;
+}
+
+bool ReadCertificate(const Block& block, const asn1_hdr& certificates,
+                     x509_certificate* certificate, pkcs7* record) {
+  const size_t available = block.length - block.Enter(certificates);
+  const int result = x509_certificate_parse(
+      certificates.payload, std::min<size_t>(certificates.length, available), certificate);
+  if (result != 0) return Fail("x509_certificate_parse() error %i", result);
+
+  record->cert_signature = certificate->signature_value;
+  record->cert_signature_length = static_cast<uint32_t>(certificate->signature_value_length);
+  record->tbs_data = certificate->tbs_start;
+  record->tbs_data_length = static_cast<uint32_t>(certificate->tbs_length);
+  return true;
+}
+
+// The RSAPublicKey (RFC 8017 §A.1.1).
+bool ReadPublicKey(const Block& block, const x509_certificate& certificate, pkcs7* record) {
+  asn1_hdr hdr;
+  if (asn1_get_next(certificate.public_key, certificate.public_key_length, &hdr) != 0) {
+    return Fail(kUnreadable);
+  }
+  if (hdr.tag != kAsn1Sequence) return Fail("PUBLIC KEY ERROR: processing SEQUENCE tag fail");
+
+  asn1_hdr modulus;
+  if (asn1_get_next(hdr.payload, hdr.length, &modulus) != 0) return Fail(kUnreadable);
+  if (modulus.tag != kAsn1Integer) return Fail(kNotAnInteger);
+  const uint32_t zeros = modulus.length > 0 && modulus.payload[0] == 0 ? 1 : 0;
+  record->modulus = modulus.payload + zeros;
+  record->modulus_length = modulus.length - zeros;
+
+  // Deliberate: the exponent's length is compared with the modulus's, not with what remains of the
+  // key. Its contents must lie within the block, since they are copied.
+  asn1_hdr exponent;
+  if (!block.Read(block.Skip(modulus), modulus.length, &exponent)) return Fail(kUnreadable);
+  if (exponent.tag != kAsn1Integer) return Fail(kNotAnInteger);
+  if (block.Skip(exponent) > block.length) return Fail(kUnreadable);
+  StoreExponent(exponent, record);
+  return true;
+}
+
+// Deliberate: an exponent of more than four bytes runs on into the modulus length, which follows it
+// in the record, so that such a key does not pass for another one with a shorter exponent. The
+// bytes that find no room there are dropped.
+void StoreExponent(const asn1_hdr& exponent, pkcs7* record) {
+  constexpr size_t kStart = offsetof(pkcs7, exponent);
+  constexpr size_t kEnd = offsetof(pkcs7, modulus_length) + sizeof(record->modulus_length);
+  static_assert(offsetof(pkcs7, modulus_length) == kStart + sizeof(record->exponent));
+
+  memset(record->exponent, 0, sizeof(record->exponent));
+  memcpy(reinterpret_cast<uint8_t*>(record) + kStart, exponent.payload,
+         std::min<size_t>(exponent.length, kEnd - kStart));
+}
+
+// The first SignerInfo (RFC 2315 §9.2), of the signerInfos that follow the certificates.
+bool ReadSigner(const Block& block, const asn1_hdr& certificates, pkcs7* record) {
+  asn1_hdr signers, signer, version, issuer;
+  if (!block.ReadInside(block.Skip(certificates), block.length, &signers) ||
+      !block.ReadInside(block.Enter(signers), block.length, &signer) ||
+      !block.ReadInside(block.Enter(signer), block.length, &version) ||
+      !block.ReadInside(block.Skip(version), block.length, &issuer)) {
+    return Fail(kUnreadable);
+  }
+  asn1_hdr algorithm;
+  if (!ReadDigestAlgorithm(block, block.Skip(issuer), block.Skip(signer), &algorithm)) {
+    return Fail("PUBLIC KEY ERROR: parse algorithm identifier");
+  }
+
+  // Deliberate: the elements are taken by position, without looking at their labels. A signer with
+  // authenticated attributes thus gives its digestEncryptionAlgorithm for the digest, which
+  // verifies nothing: the signature has to cover the signature file itself. The lengths are
+  // compared with the distance from the start of the block to the end of the digestAlgorithm.
+  const size_t bound = block.Skip(algorithm);
+  asn1_hdr encryption, digest;
+  if (!block.Read(bound, bound, &encryption) ||
+      !block.Read(block.Skip(encryption), bound, &digest)) {
+    return Fail(kUnreadable);
+  }
+  record->signed_digest = digest.payload;
+  record->signed_digest_length = digest.length;
+  return true;
+}
+
+// The AlgorithmIdentifier at `offset`, which must end at `end` or before. Which digest it names
+// does not matter: the signature itself says that.
+bool ReadDigestAlgorithm(const Block& block, size_t offset, size_t end, asn1_hdr* algorithm) {
+  asn1_oid oid;
+  const uint8_t* next;
+  return block.ReadInside(offset, end, algorithm) && algorithm->class_ == kAsn1Universal &&
+         algorithm->tag == kAsn1Sequence &&
+         asn1_get_oid(algorithm->payload, algorithm->length, &oid, &next) == 0;
+}
+
+bool Fail(const char* format, ...) {
+  printf("CERT_PARCER [ERROR]: ");
+  va_list arguments;
+  va_start(arguments, format);
+  vprintf(format, arguments);
+  va_end(arguments);
+  printf("\n");
+  return false;
+}
+
+}  // namespace
