@@ -104,8 +104,7 @@ void ManifestMf::endLine(Progress& at) {
   const char next = text_[at.cursor];
   if (IsLineBreak(next)) {
     at.storePair();
-    sections_.push_back(std::move(at.section));
-    at.section = Section();
+    sections_.push_back(std::exchange(at.section, {}));
     at.state = P_START;
   } else if (next == ' ') {
     ++at.cursor;
