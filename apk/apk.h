@@ -1,4 +1,9 @@
-// The opened file: its zip archive, what its manifest says, and how far it verified.
+// The opened file: its zip archive, what its manifests say, and how far it verified.
+//
+// An Apk owns its facts, but not the descriptor that it is given. It never writes to the file.
+// Nothing fails by throwing: construction leaves flags that say how far it got, checks answer true
+// or false, and every failure is logged as an error where it is found, unless said otherwise. One
+// thread uses an object from its construction to its end.
 #pragma once
 
 #include <ziparchive/zip_archive.h>
@@ -15,43 +20,98 @@ namespace ApkTools {
 
 class Apk {
  public:
+  // The name of the manifest's entry; read at each use.
   static const char* kMANIFEST_MF;
 
+  // As Init(fd, nullptr) on an empty object.
   explicit Apk(int fd);
+  // Closes neither the archive nor the descriptor: the process ends right after the run.
   ~Apk();
   Apk(const Apk&) = delete;
   Apk& operator=(const Apk&) = delete;
 
+  // Opens the file as a zip archive and, when it is a package (it holds "AndroidManifest.xml"),
+  // verifies its JAR signature and reads its manifests.
+  //
+  // `fd`: the file, open for reading; the caller keeps it open for the life of the object and
+  // closes it. -1 makes Init open `path` itself, for the life of the process. `path`: the file's
+  // name; null takes the name that the descriptor has in /proc.
+  //
+  // The outcome is read from the flags below. Called again, it starts from cleared flags; a fact
+  // that it does not get to keeps what it was.
   void Init(int fd, const char* path);
 
+  // The path given to Init, or the descriptor's; may be empty.
   const std::string& GetPath() const { return path_; }
+  // The descriptor given to Init, or what Init's own open returned.
   int GetFd() const { return fd_; }
+  // The file could be opened as a zip archive.
   bool IsGoodZip() const { return is_good_zip_; }
+  // The archive holds "AndroidManifest.xml", and it could be extracted.
   bool IsApk() const { return is_apk_; }
+  // The package attribute of the Android manifest, UTF-8; may be empty.
   const std::string& GetPackageName() const { return package_name_; }
+  // The signer's RSA modulus, big-endian, without leading zero; empty unless the signature
+  // verified.
   const std::vector<uint8_t>& GetManufacturerKey() const { return manufacturer_key_; }
+  // The Android manifest asks for the secure-storage permission.
   bool IsSsPermissionRequired() const { return ss_permission_required_; }
 
+  // Walking the archive: an open archive is needed, and results are the zip library's (0: success).
+  // StartIteration stores a cookie for the entries whose names begin with `prefix` and end with
+  // `suffix`; an empty text filters nothing. Next gives them one by one in the library's order, -1
+  // at their end; `name` changes only with a result of 0. EndIteration releases the cookie.
   int32_t StartIteration(void** cookie, const std::string& prefix, const std::string& suffix);
   int32_t Next(void* cookie, ZipEntry* entry, std::string& name);
   void EndIteration(void* cookie);
 
+  // The steps of Init that read more than the archive. Each answers whether it succeeded.
+
+  // Finds the signature file (the first entry "META-INF/….SF" in the archive's order), parses it
+  // and verifies the signature block that belongs to it ("RSA" in place of "SF"). A package without
+  // a signature file, or with one that cannot be extracted, fails without a message.
   bool InitCertSf();
+  // Whether the block's certificate is signed with its own key and the block's signature, by the
+  // same key, covers the signature file with these digests. On success `key` becomes the key's
+  // modulus, else it is untouched.
   bool VerifyCertificate(std::vector<uint8_t>& block, std::vector<uint8_t>& sha1,
                          std::vector<uint8_t>& sha256, std::vector<uint8_t>& md5,
                          std::vector<uint8_t>& key);
+  // Whether the signature file's "-Digest-Manifest" is the digest of `manifest`, the raw manifest.
   bool ValidateManifest(const std::vector<uint8_t>& manifest);
+  // Whether `expected` is the digest of `data` that a digest attribute of this name holds
+  // ("SHA1-Digest" or "SHA-256-Digest"). A mismatch is not logged.
   bool VerifyData(const std::string& digest_name, const std::vector<uint8_t>& expected,
                   const std::vector<uint8_t>& data);
+  // Reads the package name and the secure-storage permission from a compiled "AndroidManifest.xml".
+  // False only when the bytes are no compiled XML at all; nothing changes then.
   bool ParseAndroidManifest(const std::vector<uint8_t>& bytes);
 
+  // Whether the package verified, and its "classes.dex", if it has one, as well. The first call
+  // checks that entry, later ones remember.
   bool IsGoodApk();
+  // Whether the entry, as the zip library found it under `name`, has the digest that the manifest
+  // records for the name. A mismatch, and an entry that cannot be extracted, are not logged.
   bool VerifyEntryHash(const std::string& name, ZipEntry& entry);
+  // Whether the file at `path` has the digest that the manifest records for the entry `name`. A
+  // mismatch is not logged.
   bool VerifyFileHash(const std::string& name, const std::string& path);
+  // Whether `name` is one of the signature's own files, which no manifest lists.
   bool CanSkipValidation(const std::string& name);
 
  private:
+  // For an entry's name, its digest attribute's name and value (base64).
+  using EntryDigests = std::map<std::string, std::pair<std::string, std::string>>;
+
+  bool FindFile(const char* path);
+  bool OpenZip(bool own_fd);
   int32_t ExtractEntry(const std::string& name, std::vector<uint8_t>& out);
+  bool VerifyPackage(const std::vector<uint8_t>& android_manifest);
+  static EntryDigests CollectDigests(const std::vector<ManifestMf::Section>& sections);
+  bool ExtractSignatureFile(std::string& name, std::vector<uint8_t>& content);
+  bool VerifyDex();
+  template <typename ReadContent>
+  bool VerifyContent(const std::string& name, ReadContent read_content);
 
   std::string path_;
   int fd_ = -1;
@@ -60,7 +120,7 @@ class Apk {
   bool is_good_apk_ = false;
   bool dex_checked_ = false;
   bool is_good_zip_ = false;
-  std::map<std::string, std::pair<std::string, std::string>> entry_digests_;
+  EntryDigests entry_digests_;
   ManifestMf manifest_mf_;
   ManifestMf cert_sf_;
   std::vector<uint8_t> manufacturer_key_;

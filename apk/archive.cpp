@@ -1,1 +1,134 @@
+// Opening the archive, and the road of a package through its verification.
+#include <fcntl.h>
+
+#include <cerrno>
+#include <cstring>
+
 #include "apk/apk.h"
+#include "apk/zip_library.h"
+#include "util/file.h"
+#include "util/log.h"
+#include "util/text.h"
+
+namespace ApkTools {
+
+const char* Apk::kMANIFEST_MF = "META-INF/MANIFEST.MF";
+
+Apk::Apk(int fd) { Init(fd, nullptr); }
+
+Apk::~Apk() = default;
+
+void Apk::Init(int fd, const char* path) {
+  zip_handle_ = nullptr;
+  is_apk_ = is_good_apk_ = dex_checked_ = is_good_zip_ = false;
+  fd_ = fd;
+  ss_permission_required_ = false;
+
+  if (!FindFile(path)) return;
+  if (!OpenZip(/*own_fd=*/fd == -1)) return;
+  is_good_zip_ = true;
+
+  std::vector<uint8_t> android_manifest;
+  const int32_t result = ExtractEntry("AndroidManifest.xml", android_manifest);
+  if (result != 0) {
+    LogError("Can't extract Android Manifest: %s\n", ErrorCodeString(result));
+    return;
+  }
+  is_apk_ = true;
+  is_good_apk_ = VerifyPackage(android_manifest);
+}
+
+// Settles descriptor and path, of which the caller may have given but one.
+bool Apk::FindFile(const char* path) {
+  if (fd_ < 0 && path == nullptr) {
+    LogError("Can't initialize Apk: need valid file descriptor or filename\n");
+    return false;
+  }
+  if (fd_ == -1) {
+    fd_ = open(path, O_RDONLY | O_CLOEXEC);
+    // Deliberate: descriptor 0 is a failure too. It is standard input's, and only a process that
+    // was started without one, not as it should be, could be given it here.
+    if (fd_ < 1) {
+      LogError("open('%s') failed: %s\n", path, strerror(errno));
+      return false;
+    }
+  }
+  path_ = path == nullptr ? GetFilenameByFd(fd_) : path;
+  return true;
+}
+
+// With `own_fd`, closing the descriptor becomes the archive's task.
+bool Apk::OpenZip(bool own_fd) {
+  const int32_t result = OpenArchiveFd(fd_, path_.c_str(), &zip_handle_, own_fd);
+  if (result != 0) {
+    LogError("OpenArchiveFd(%d) [file: %s] returned: %d: %s\n", fd_, path_.c_str(), result,
+             ErrorCodeString(result));
+    zip_handle_ = nullptr;
+    return false;
+  }
+  return true;
+}
+
+// Extracts the entry of this name whole. Results are the zip library's; `out` is untouched when
+// there is no such entry.
+int32_t Apk::ExtractEntry(const std::string& name, std::vector<uint8_t>& out) {
+  ZipEntry entry;
+  const int32_t result = FindZipEntry(zip_handle_, name, &entry);
+  if (result != 0) return result;
+  return ExtractZipEntry(zip_handle_, &entry, out);
+}
+
+// The signature first, then what it vouches for.
+bool Apk::VerifyPackage(const std::vector<uint8_t>& android_manifest) {
+  std::vector<uint8_t> manifest;
+  if (ExtractEntry(kMANIFEST_MF, manifest) != 0) return false;
+  const std::string manifest_text(manifest.begin(), manifest.end());
+
+  if (!InitCertSf()) return false;
+  if (!ValidateManifest(manifest)) {
+    LogError("Can't validate manifest.\n");
+    return false;
+  }
+  if (!manifest_mf_.load(manifest_text)) {
+    LogError("Can't load manifest: size=%zu\n", manifest_text.size());
+    return false;
+  }
+  if (!ParseAndroidManifest(android_manifest)) {
+    LogError("Can't process Android Manifest.\n");
+    return false;
+  }
+  entry_digests_ = CollectDigests(manifest_mf_.getSections());
+  return true;
+}
+
+Apk::EntryDigests Apk::CollectDigests(const std::vector<ManifestMf::Section>& sections) {
+  EntryDigests digests;
+  for (const ManifestMf::Section& section : sections) {
+    std::string entry_name, digest_name, digest;
+    for (const auto& [name, value] : section) {
+      if (name == "Name") entry_name = value;
+      // Deliberate: of several digests the last in the order of names counts, so that "SHA1-Digest"
+      // goes before "SHA-256-Digest". The signature file's are chosen in the same way.
+      if (EndsWith(name, "-Digest")) {
+        digest_name = name;
+        digest = value;
+      }
+    }
+    // The main section, which names no entry, is left out here as well.
+    if (entry_name.empty() || digest_name.empty() || digest.empty()) continue;
+    digests[entry_name] = {digest_name, digest};
+  }
+  return digests;
+}
+
+int32_t Apk::StartIteration(void** cookie, const std::string& prefix, const std::string& suffix) {
+  return StartZipIteration(zip_handle_, cookie, prefix, suffix);
+}
+
+int32_t Apk::Next(void* cookie, ZipEntry* entry, std::string& name) {
+  return NextZipEntry(cookie, entry, name);
+}
+
+void Apk::EndIteration(void* cookie) { ::EndIteration(cookie); }
+
+}  // namespace ApkTools

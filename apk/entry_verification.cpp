@@ -1,1 +1,67 @@
+// Single entries and files against the digests that the manifest records for them.
+#include <set>
+
 #include "apk/apk.h"
+#include "apk/base64.h"
+#include "apk/zip_library.h"
+#include "util/file.h"
+#include "util/log.h"
+
+namespace ApkTools {
+
+bool Apk::IsGoodApk() {
+  if (!is_good_apk_) return false;
+  if (dex_checked_) return true;
+  if (!VerifyDex()) {
+    LogError("Integrity not confirmed: classes.dex\n");
+    is_good_apk_ = false;
+  }
+  dex_checked_ = true;
+  return is_good_apk_;
+}
+
+// Only an archive that has no such entry passes without one; an entry that is there but cannot be
+// read has not been verified.
+bool Apk::VerifyDex() {
+  ZipEntry dex;
+  const int32_t result = FindZipEntry(zip_handle_, "classes.dex", &dex);
+  if (result == kZipEntryNotFound) return true;
+  return result == 0 && VerifyEntryHash("classes.dex", dex);
+}
+
+bool Apk::VerifyEntryHash(const std::string& name, ZipEntry& entry) {
+  return VerifyContent(name, [&](std::vector<uint8_t>& content) {
+    return ExtractZipEntry(zip_handle_, &entry, content) == 0;
+  });
+}
+
+bool Apk::VerifyFileHash(const std::string& name, const std::string& path) {
+  return VerifyContent(name,
+                       [&](std::vector<uint8_t>& content) { return ReadFile(path, content); });
+}
+
+// `read_content` fills a vector, and answers whether it could; it is not called for a name that the
+// manifest does not list.
+template <typename ReadContent>
+bool Apk::VerifyContent(const std::string& name, ReadContent read_content) {
+  const auto recorded = entry_digests_.find(name);
+  if (recorded == entry_digests_.end()) {
+    if (CanSkipValidation(name)) return true;
+    LogError("Can't find file in %s: %s\n", kMANIFEST_MF, name.c_str());
+    return false;
+  }
+  const auto& [digest_name, digest] = recorded->second;
+  const std::vector<uint8_t> expected = Base64Decode(digest);
+  std::vector<uint8_t> content;
+  return read_content(content) && VerifyData(digest_name, expected, content);
+}
+
+bool Apk::CanSkipValidation(const std::string& name) {
+  static const std::set<std::string> kSignatureFiles = {
+      "META-INF/CERT.RSA",    "META-INF/ANDROIDD.RSA", "META-INF/SECUREST.RSA", "META-INF/CERT.SF",
+      "META-INF/ANDROIDD.SF", "META-INF/SECUREST.SF",  "META-INF/MANIFEST.MF",
+  };
+  return kSignatureFiles.count(name) != 0;
+}
+
+}  // namespace ApkTools
