@@ -3,6 +3,7 @@
 #include <fcntl.h>
 #include <unistd.h>
 
+#include <algorithm>
 #include <cerrno>
 #include <cstring>
 #include <string>
@@ -99,9 +100,9 @@ uint32_t SignJar(ApkTools::Apk& apk, int fd) {
 // The kernel's payload: the length of `data` as 16 bits in host byte order, then `data`.
 std::vector<uint8_t> SignPayload(const std::vector<uint8_t>& data) {
   const uint16_t length = static_cast<uint16_t>(data.size());
-  std::vector<uint8_t> payload(sizeof(length));
+  std::vector<uint8_t> payload(sizeof(length) + data.size());
   memcpy(payload.data(), &length, sizeof(length));
-  payload.insert(payload.end(), data.begin(), data.end());
+  std::copy(data.begin(), data.end(), payload.begin() + sizeof(length));
   return payload;
 }
 
