@@ -9,6 +9,7 @@
 #include <algorithm>
 #include <cstdarg>
 #include <cstdint>
+#include <cstdlib>
 #include <cstring>
 #include <mutex>
 
@@ -29,8 +30,12 @@ void Trust(int fd);
 bool IsTrusted(int fd);
 int Answer(Event* event, int error, int errno_before);
 
-// First thing in the process: the journal shows that the stand-ins are in place.
-__attribute__((constructor)) void Attach() { Record(Event("attached").Number("pid", getpid())); }
+// The journal shows that the stand-ins are in place; the environment no longer does, and what the
+// tool starts goes without them.
+__attribute__((constructor)) void Attach() {
+  Record(Event("attached").Number("pid", getpid()));
+  unsetenv("LD_PRELOAD");
+}
 
 }  // namespace
 

@@ -35,8 +35,8 @@ std::optional<int> ParseOptions(int argc, char** argv, Options* options) {
 
   AddPhone(&app, &options->phone);
   app.add_option("--trust", options->trust, "The kernel trusts FILE (may be repeated)")
+      ->check(CLI::ExistingFile.description(""))
       ->type_name("FILE")
-      ->check(CLI::ExistingFile)
       ->allow_extra_args(false);
   app.add_option("--state", options->state,
                  "What was signed is remembered in DIR, and trusted while its bytes stay the same")
@@ -47,7 +47,7 @@ std::optional<int> ParseOptions(int argc, char** argv, Options* options) {
       ->type_name("PATH");
   app.add_option("--timeout", options->timeout, "Give up a tool that takes longer")
       ->type_name("SECONDS")
-      ->check(CLI::PositiveNumber)
+      ->check(CLI::Range(0.001, 1e6).description(""))
       ->capture_default_str();
   app.add_option("--runner", runner,
                  "Words to put before the tool: an emulator that takes -E NAME=VALUE")

@@ -10,6 +10,7 @@
 #include <cerrno>
 #include <cstring>
 #include <filesystem>
+#include <sstream>
 
 #include "simulator/journal.h"
 #include "simulator/run.h"
@@ -25,6 +26,12 @@ bool Fail(const std::string& message, std::string* error) {
 
 // Why the last system call failed.
 std::string Because() { return std::string(": ") + strerror(errno); }
+
+std::string Seconds(double seconds) {
+  std::ostringstream text;
+  text << seconds << (seconds == 1 ? " second" : " seconds");
+  return text.str();
+}
 
 // As the kernel names the file once it is open.
 std::string Resolved(const std::string& file) {
@@ -113,7 +120,9 @@ bool Simulation::RunTool(const std::string& file, const std::string& path, std::
       return Fail("cannot start " + options_.tool + Because(), error);
     case End::kTimedOut:
       Event("exit").Number("signal", SIGKILL).AppendTo(journal_);
-      return Fail(options_.tool + " did not end in time and was killed: " + file, error);
+      return Fail(options_.tool + " was still running after " + Seconds(options_.timeout) +
+                      " and was killed (it waits for ever while its integrity value is ffffffff)",
+                  error);
     case End::kKilled:
       return Event("exit").Number("signal", ending.value).AppendTo(journal_);
     case End::kExited:

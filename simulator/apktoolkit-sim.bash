@@ -1,0 +1,49 @@
+# Completion of apktoolkit-sim for bash: options, and what may follow each of them.
+
+_apktoolkit_sim() {
+  local word=${COMP_WORDS[COMP_CWORD]} before=${COMP_WORDS[COMP_CWORD - 1]}
+  # "--option=value" comes as three words.
+  if [[ $word == = ]]; then
+    word=
+  elif [[ $before == = && $COMP_CWORD -gt 1 ]]; then
+    before=${COMP_WORDS[COMP_CWORD - 2]}
+  fi
+
+  COMPREPLY=()
+  case $before in
+    --integrity)
+      mapfile -t COMPREPLY < <(compgen -W "1f 0 missing ffffffff,ffffffff,1f" -- "$word")
+      ;;
+    --sign-errno | --verify-errno)
+      mapfile -t COMPREPLY < <(
+        compgen -W "EACCES EBADMSG EINVAL EIO EKEYREJECTED ENOKEY ENOSYS EOPNOTSUPP EPERM" \
+          -- "$word"
+      )
+      ;;
+    --zu-result)
+      mapfile -t COMPREPLY < <(compgen -W "0 65540 -1" -- "$word")
+      ;;
+    --state)
+      compopt -o filenames
+      mapfile -t COMPREPLY < <(compgen -d -- "$word")
+      ;;
+    --runner | --tool)
+      compopt -o filenames
+      mapfile -t COMPREPLY < <(compgen -c -- "$word" && compgen -f -- "$word")
+      ;;
+    --timeout | -h | --help) ;;
+    *)
+      if [[ $word == -* ]]; then
+        mapfile -t COMPREPLY < <(
+          compgen -W "--help --integrity --journal --json --runner --sign-errno --state
+            --timeout --tool --trust --verify-errno --zu-result" -- "$word"
+        )
+      else
+        compopt -o filenames
+        mapfile -t COMPREPLY < <(compgen -f -- "$word")
+      fi
+      ;;
+  esac
+}
+
+complete -F _apktoolkit_sim apktoolkit-sim
