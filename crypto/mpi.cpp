@@ -1,1 +1,511 @@
 #include "crypto/mpi.h"
+
+#include <algorithm>
+#include <climits>
+#include <cstdarg>
+#include <cstdlib>
+#include <cstring>
+#include <utility>
+
+// Deliberate: limbs have 32 bits and no arithmetic on them is wider, on 64-bit processors too:
+// there is one way to compute, in half limbs, and it needs no double-width type of the compiler's.
+
+namespace {
+
+constexpr int kLimbBits = 32;
+constexpr int kLimbBytes = 4;
+
+// The window table of an exponentiation; its index has up to 6 bits.
+constexpr int kWindowTableSize = 64;
+
+// What the Montgomery products of one exponentiation share.
+struct montgomery {
+  const mpi* N;
+  uint32_t mm;
+  mpi_local T;
+
+  void multiply(mpi* A, const mpi* B) { mpi_montmul(A, B, N, mm, &T); }
+};
+
+void release_limbs(mpi* X);
+void clear_limbs(mpi* X);
+int used_limbs(const mpi* X);
+int sign_of(const mpi* X);
+int compare_limbs(int count, const uint32_t* a, const uint32_t* b);
+uint32_t add_limbs(int count, const uint32_t* s, uint32_t* d);
+uint32_t subtract_limbs(int count, const uint32_t* s, uint32_t* d);
+void subtract_with_borrow(int count, const uint32_t* s, uint32_t* d);
+template <int kCount>
+uint32_t multiply_add(const uint32_t* s, uint32_t* d, uint32_t b, uint32_t c);
+int reduce(mpi* X, const mpi* B);
+uint32_t quotient_digit(const mpi* X, int i, const mpi* Y, int t);
+uint32_t estimate_digit(uint32_t high, uint32_t low, uint32_t d);
+uint32_t half_digit(uint32_t* rest, uint32_t next, uint32_t d);
+void shift_r(mpi* X, int count);
+uint32_t montgomery_constant(uint32_t m0);
+int window_size(int exponent_bits);
+int fill_window(mpi_local* W, int w, montgomery* m);
+void raise(mpi* X, const mpi* E, const mpi_local* W, int w, montgomery* m);
+
+}  // namespace
+
+void mpi_init(mpi* X, ...) {
+  va_list rest;
+  va_start(rest, X);
+  for (; X != nullptr; X = va_arg(rest, mpi*)) *X = {1, 0, nullptr};
+  va_end(rest);
+}
+
+void mpi_free(mpi* X, ...) {
+  va_list rest;
+  va_start(rest, X);
+  for (; X != nullptr; X = va_arg(rest, mpi*)) {
+    release_limbs(X);
+    *X = {1, 0, nullptr};
+  }
+  va_end(rest);
+}
+
+int mpi_grow(mpi* X, int nblimbs) {
+  if (X->n >= nblimbs) return 0;
+  const size_t old_size = static_cast<size_t>(X->n) * kLimbBytes;
+  const size_t size = static_cast<size_t>(nblimbs) * kLimbBytes;
+  uint32_t* const p = static_cast<uint32_t*>(malloc(size));
+  if (p == nullptr) return kMpiNoMemory;
+  if (X->n > 0) memcpy(p, X->p, old_size);
+  memset(p + X->n, 0, size - old_size);
+  release_limbs(X);
+  X->n = nblimbs;
+  X->p = p;
+  return 0;
+}
+
+int mpi_assign(mpi* X, const mpi* A) {
+  if (X == A) return 0;
+  const int used = used_limbs(A);
+  if (const int result = mpi_grow(X, used)) return result;
+  clear_limbs(X);
+  for (int i = 0; i < used; ++i) X->p[i] = A->p[i];
+  X->s = A->s;
+  return 0;
+}
+
+int mpi_from_bytes(mpi* X, const uint8_t* bytes, size_t len) {
+  for (; len > 0 && *bytes == 0; --len) ++bytes;
+  const size_t limbs = len / kLimbBytes + (len % kLimbBytes != 0 ? 1 : 0);
+  if (const int result = mpi_grow(X, std::max(1, static_cast<int>(limbs)))) return result;
+  clear_limbs(X);
+  X->s = 1;
+  for (size_t i = 0; i < len; ++i)
+    X->p[i / kLimbBytes] |= uint32_t{bytes[len - 1 - i]} << (8 * (i % kLimbBytes));
+  return 0;
+}
+
+int mpi_to_bytes(const mpi* X, uint8_t* bytes, size_t len) {
+  const int bits = mpi_msb(X);
+  const size_t used = static_cast<size_t>(bits / 8 + (bits % 8 != 0 ? 1 : 0));
+  if (used > len) return kMpiBufferTooSmall;
+  for (size_t i = 0; i < len; ++i) {
+    const uint32_t limb = i < used ? X->p[i / kLimbBytes] : 0;
+    bytes[len - 1 - i] = static_cast<uint8_t>(limb >> (8 * (i % kLimbBytes)));
+  }
+  return 0;
+}
+
+int mpi_msb(const mpi* X) {
+  const int used = used_limbs(X);
+  return used == 0 ? 0 : used * kLimbBits - __builtin_clz(X->p[used - 1]);
+}
+
+int mpi_compare_abs(const mpi* A, const mpi* B) {
+  const int used = used_limbs(A);
+  const int difference = used - used_limbs(B);
+  return difference != 0 ? difference : compare_limbs(used, A->p, B->p);
+}
+
+int mpi_compare(const mpi* A, const mpi* B) {
+  const int difference = sign_of(A) - sign_of(B);
+  if (difference != 0) return difference;
+  return sign_of(A) < 0 ? mpi_compare_abs(B, A) : mpi_compare_abs(A, B);
+}
+
+int mpi_shift_l(mpi* X, int count) {
+  if (count < 0) return 0;
+  const int bits = mpi_msb(X);
+  if (count > INT_MAX - bits) return kMpiNoMemory;
+  const int length = bits + count;
+  const int limbs = length / kLimbBits + (length % kLimbBits != 0 ? 1 : 0);
+  if (const int result = mpi_grow(X, limbs)) return result;
+
+  const int v = count / kLimbBits;
+  for (int i = X->n - 1; i >= v; --i) X->p[i] = X->p[i - v];
+  for (int i = 0; i < v; ++i) X->p[i] = 0;
+
+  const int t = count % kLimbBits;
+  if (t == 0) return 0;
+  uint32_t carry = 0;
+  for (int i = v; i < X->n; ++i) {
+    const uint32_t limb = X->p[i];
+    X->p[i] = (limb << t) | carry;
+    carry = limb >> (kLimbBits - t);
+  }
+  return 0;
+}
+
+int mpi_add_abs(mpi* X, const mpi* A, const mpi* B) {
+  if (X == B) std::swap(A, B);
+  const int used = used_limbs(B);
+  if (const int result = mpi_assign(X, A)) return result;
+  if (const int result = mpi_grow(X, used)) return result;
+  X->s = 1;
+  uint32_t carry = add_limbs(used, B->p, X->p);
+  for (int i = used; carry != 0; ++i) {
+    if (const int result = mpi_grow(X, i + 1)) return result;
+    X->p[i] += carry;
+    carry = X->p[i] < carry;
+  }
+  return 0;
+}
+
+int mpi_sub_abs(mpi* X, const mpi* A, const mpi* B) {
+  if (mpi_compare_abs(A, B) < 0) return kMpiNegativeResult;
+  mpi_local copy;
+  if (X == B) {
+    if (const int result = mpi_assign(&copy, B)) return result;
+    B = &copy;
+  }
+  if (const int result = mpi_assign(X, A)) return result;
+  X->s = 1;
+  subtract_with_borrow(used_limbs(B), B->p, X->p);
+  return 0;
+}
+
+int mpi_mul_int(mpi* X, const mpi* A, unsigned int b) {
+  mpi_local copy;
+  if (X == A) {
+    if (const int result = mpi_assign(&copy, A)) return result;
+    A = &copy;
+  }
+  const int used = used_limbs(A);
+  if (const int result = mpi_grow(X, std::max(1, b != 0 ? used + 1 : used))) return result;
+  clear_limbs(X);
+  if (b != 0) mpi_mul_hlp(used, A->p, X->p, b);
+  X->s = A->s;
+  return 0;
+}
+
+void mpi_mul_hlp(int count, const unsigned int* s, unsigned int* d, unsigned int b) {
+  uint32_t c = 0;
+  for (; count >= 16; count -= 16, s += 16, d += 16) c = multiply_add<16>(s, d, b, c);
+  for (; count >= 8; count -= 8, s += 8, d += 8) c = multiply_add<8>(s, d, b, c);
+  for (; count > 0; --count, ++s, ++d) c = multiply_add<1>(s, d, b, c);
+  for (; c != 0; ++d) c = (*d += c) < c;
+}
+
+int mpi_mod_mpi(mpi* R, const mpi* A, const mpi* B) {
+  if (used_limbs(B) == 0) return kMpiDivisionByZero;
+  mpi_local X;
+  if (const int result = mpi_assign(&X, A)) return result;
+  if (mpi_compare_abs(&X, B) >= 0) {
+    if (const int result = reduce(&X, B)) return result;
+  }
+  // The magnitude is below the divisor's now, so one addition lifts a negative remainder above
+  // zero.
+  if (sign_of(&X) < 0) {
+    if (const int result = mpi_sub_abs(&X, B, &X)) return result;
+  }
+  X.s = 1;
+  return mpi_assign(R, &X);
+}
+
+void mpi_montmul(mpi* A, const mpi* B, const mpi* N, unsigned int mm, mpi* T) {
+  clear_limbs(T);
+  const int n = N->n;
+  const int m = std::min(B->n, n);
+  uint32_t* d = T->p;
+  for (int i = 0; i < n; ++i) {
+    const uint32_t u0 = A->p[i];
+    const uint32_t u1 = (d[0] + u0 * B->p[0]) * mm;
+    mpi_mul_hlp(m, B->p, d, u0);
+    mpi_mul_hlp(n, N->p, d, u1);
+    // The two rows made this limb zero, so that it can hold another value.
+    *d++ = u0;
+    d[n + 1] = 0;
+  }
+  for (int i = 0; i <= n; ++i) A->p[i] = d[i];
+
+  // Deliberate: a product below N is subtracted all the same, from scratch limbs that nobody reads,
+  // so that the time taken does not tell which of the two it was. T holds that product above its
+  // lowest n limbs, hence is no less than it and absorbs the borrow.
+  if (mpi_compare_abs(A, N) >= 0) {
+    subtract_with_borrow(n, N->p, A->p);
+  } else {
+    subtract_with_borrow(n, A->p, T->p);
+  }
+}
+
+int mpi_pow_mod(mpi* X, const mpi* A, const mpi* E, const mpi* N) {
+  if (sign_of(N) < 0 || N->n == 0 || N->p[0] % 2 == 0) return kMpiBadModulus;
+  const int w = window_size(mpi_msb(E));
+  montgomery m = {N, montgomery_constant(N->p[0]), {}};
+  mpi_local W[kWindowTableSize];
+  mpi_local RR;
+  mpi_local one;
+  if (const int result = mpi_grow(X, N->n + 1)) return result;
+  if (const int result = mpi_grow(&W[1], N->n + 1)) return result;
+  if (const int result = mpi_grow(&m.T, 2 * (N->n + 1))) return result;
+  if (const int result = mpi_grow(&one, 1)) return result;
+  if (const int result = mpi_grow(&RR, 1)) return result;
+  one.p[0] = 1;
+  RR.p[0] = 1;
+
+  // A product with R^2 mod N, R = 2^(32 * N.n), takes a number into Montgomery form, one with 1
+  // takes it out again.
+  if (const int result = mpi_shift_l(&RR, 2 * kLimbBits * N->n)) return result;
+  if (const int result = mpi_mod_mpi(&RR, &RR, N)) return result;
+  const bool reduced = mpi_compare(A, N) < 0;
+  if (const int result = reduced ? mpi_assign(&W[1], A) : mpi_mod_mpi(&W[1], A, N)) return result;
+  m.multiply(&W[1], &RR);
+  if (const int result = fill_window(W, w, &m)) return result;
+
+  if (const int result = mpi_assign(X, &RR)) return result;
+  m.multiply(X, &one);
+  raise(X, E, W, w, &m);
+  m.multiply(X, &one);
+  return 0;
+}
+
+namespace {
+
+// Wipes and frees what X owns; X itself is left pointing at it.
+void release_limbs(mpi* X) {
+  if (X->n == 0) return;
+  clear_limbs(X);
+  // The compiler must take the zeros for read, or it would drop a store to memory that is freed.
+  __asm__ __volatile__("" : : "r"(X->p) : "memory");
+  free(X->p);
+}
+
+void clear_limbs(mpi* X) {
+  if (X->n > 0) memset(X->p, 0, static_cast<size_t>(X->n) * kLimbBytes);
+}
+
+// The number of limbs of X without the zero limbs at its top.
+int used_limbs(const mpi* X) {
+  int used = X->n;
+  while (used > 0 && X->p[used - 1] == 0) --used;
+  return used;
+}
+
+// -1, 0 or +1 as X is below, equal to or above zero.
+int sign_of(const mpi* X) { return used_limbs(X) == 0 ? 0 : X->s; }
+
+int compare_limbs(int count, const uint32_t* a, const uint32_t* b) {
+  for (int i = count - 1; i >= 0; --i) {
+    if (a[i] != b[i]) return a[i] < b[i] ? -1 : 1;
+  }
+  return 0;
+}
+
+// Adds `count` limbs of s to d, which may be s; returns the carry.
+uint32_t add_limbs(int count, const uint32_t* s, uint32_t* d) {
+  uint32_t carry = 0;
+  for (int i = 0; i < count; ++i) {
+    const uint32_t addend = s[i];
+    uint32_t sum = d[i] + carry;
+    carry = sum < carry;
+    sum += addend;
+    carry += sum < addend;
+    d[i] = sum;
+  }
+  return carry;
+}
+
+// Subtracts `count` limbs of s from d; returns the borrow.
+uint32_t subtract_limbs(int count, const uint32_t* s, uint32_t* d) {
+  uint32_t borrow = 0;
+  for (int i = 0; i < count; ++i) {
+    const uint32_t minuend = d[i] - borrow;
+    borrow = d[i] < borrow;
+    borrow += minuend < s[i];
+    d[i] = minuend - s[i];
+  }
+  return borrow;
+}
+
+// The same, and takes the borrow from the limbs of d above, one of which absorbs it.
+void subtract_with_borrow(int count, const uint32_t* s, uint32_t* d) {
+  uint32_t borrow = subtract_limbs(count, s, d);
+  for (int i = count; borrow != 0; ++i) borrow = d[i]-- == 0;
+}
+
+// Adds s * b + c to d over `kCount` limbs, a power of two, without a loop; returns the carry.
+template <int kCount>
+__attribute__((always_inline)) inline uint32_t multiply_add(const uint32_t* s, uint32_t* d,
+                                                            uint32_t b, uint32_t c) {
+  if constexpr (kCount > 1) {
+    constexpr int kHalf = kCount / 2;
+    return multiply_add<kHalf>(s + kHalf, d + kHalf, b, multiply_add<kHalf>(s, d, b, c));
+  } else {
+    const uint32_t b1 = b >> 16;
+    const uint32_t b0 = b & 0xFFFF;
+    const uint32_t s1 = *s >> 16;
+    const uint32_t s0 = *s & 0xFFFF;
+    const uint32_t rx = s0 * b1;
+    const uint32_t ry = s1 * b0;
+    uint32_t r0 = s0 * b0;
+    uint32_t r1 = s1 * b1;
+    r1 += rx >> 16;
+    r1 += ry >> 16;
+    const auto add = [&r0, &r1 ](uint32_t addend) __attribute__((always_inline)) {
+      r0 += addend;
+      r1 += r0 < addend;
+    };
+    add(rx << 16);
+    add(ry << 16);
+    add(c);
+    add(*d);
+    *d = r0;
+    return r1;
+  }
+}
+
+// X = abs(X) mod abs(B) with the sign of X, for abs(X) >= abs(B) > 0. Long division by 32-bit
+// digits that leaves the remainder in place of the dividend; the quotient is not kept (Knuth, The
+// Art of Computer Programming, volume 2, 4.3.1, algorithm D).
+int reduce(mpi* X, const mpi* B) {
+  mpi_local Y;
+  mpi_local product;
+  if (const int result = mpi_assign(&Y, B)) return result;
+  // The estimate of a digit is close, and never too small, when the divisor's highest bit is set.
+  const int shift = (kLimbBits - mpi_msb(&Y) % kLimbBits) % kLimbBits;
+  if (const int result = mpi_shift_l(&Y, shift)) return result;
+  if (const int result = mpi_shift_l(X, shift)) return result;
+  const int n = used_limbs(X) - 1;
+  const int t = used_limbs(&Y) - 1;
+  if (const int result = mpi_grow(&product, t + 2)) return result;
+
+  uint32_t* const top = X->p + (n - t);
+  if (compare_limbs(t + 1, top, Y.p) >= 0) subtract_limbs(t + 1, Y.p, top);
+
+  for (int i = n; i > t; --i) {
+    const uint32_t q = quotient_digit(X, i, &Y, t);
+    if (const int result = mpi_mul_int(&product, &Y, q)) return result;
+    uint32_t* const x = X->p + (i - t - 1);
+    const bool negative = subtract_limbs(t + 2, product.p, x) != 0;
+    if (negative) x[t + 1] += add_limbs(t + 1, Y.p, x);
+  }
+  shift_r(X, shift);
+  return 0;
+}
+
+// The digit of X / Y that belongs to limb i of X, or one more than it; t is the top limb of Y.
+uint32_t quotient_digit(const mpi* X, int i, const mpi* Y, int t) {
+  const uint32_t divisor[2] = {t >= 1 ? Y->p[t - 1] : 0, Y->p[t]};
+  const uint32_t dividend[3] = {i >= 2 ? X->p[i - 2] : 0, X->p[i - 1], X->p[i]};
+  uint32_t q = estimate_digit(dividend[2], dividend[1], divisor[1]);
+  for (;; --q) {
+    uint32_t product[3] = {0, 0, 0};
+    mpi_mul_hlp(2, divisor, product, q);
+    if (compare_limbs(3, product, dividend) <= 0) return q;
+  }
+}
+
+// The quotient of the two limbs by d, whose highest bit is set, as far as it fits in a limb.
+uint32_t estimate_digit(uint32_t high, uint32_t low, uint32_t d) {
+  if (high >= d) return UINT32_MAX;
+  uint32_t rest = high;
+  const uint32_t q1 = half_digit(&rest, low >> 16, d);
+  const uint32_t q0 = half_digit(&rest, low & 0xFFFF, d);
+  return (q1 << 16) | q0;
+}
+
+// Divides `rest`, which is below d, with the half limb `next` appended, by d. Returns the quotient
+// and leaves the remainder in `rest`.
+uint32_t half_digit(uint32_t* rest, uint32_t next, uint32_t d) {
+  const uint32_t d1 = d >> 16;
+  const uint32_t d0 = d & 0xFFFF;
+  uint32_t q = *rest / d1;
+  uint32_t r = ((*rest - q * d1) << 16) | next;
+  const uint32_t m = q * d0;
+  if (r < m) {
+    do {
+      --q;
+      r += d;
+    } while (r >= d && r < m);
+  }
+  *rest = r - m;
+  return q;
+}
+
+// Divides the magnitude of X by 2^count, for a count below 32.
+void shift_r(mpi* X, int count) {
+  if (count == 0) return;
+  uint32_t carry = 0;
+  for (int i = X->n - 1; i >= 0; --i) {
+    const uint32_t limb = X->p[i];
+    X->p[i] = (limb >> count) | carry;
+    carry = limb << (kLimbBits - count);
+  }
+}
+
+// -1 / m0 mod 2^32 for an odd m0: its inverse modulo 2^4, then Newton steps that double the bits.
+uint32_t montgomery_constant(uint32_t m0) {
+  uint32_t x = m0 + ((m0 * 2 + 4) & 8);
+  for (int bits = kLimbBits; bits >= 8; bits /= 2) x *= 2 - m0 * x;
+  return 0 - x;
+}
+
+// How many bits of the exponent one product takes in. Deliberate: there is no window of 2;
+// exponents as short as that have few set bits in practice, and it would gain nothing.
+int window_size(int exponent_bits) {
+  return exponent_bits > 671   ? 6
+         : exponent_bits > 239 ? 5
+         : exponent_bits > 79  ? 4
+         : exponent_bits > 23  ? 3
+                               : 1;
+}
+
+// From W[1] makes the powers W[i] = W[1]^i whose index has w bits, highest bit set: a window begins
+// with a set bit, so no other is ever needed.
+int fill_window(mpi_local* W, int w, montgomery* m) {
+  if (w == 1) return 0;
+  const int j = 1 << (w - 1);
+  if (const int result = mpi_grow(&W[j], m->N->n + 1)) return result;
+  if (const int result = mpi_assign(&W[j], &W[1])) return result;
+  for (int i = 1; i < w; ++i) m->multiply(&W[j], &W[j]);
+  for (int i = j + 1; i < 2 * j; ++i) {
+    if (const int result = mpi_grow(&W[i], m->N->n + 1)) return result;
+    if (const int result = mpi_assign(&W[i], &W[i - 1])) return result;
+    m->multiply(&W[i], &W[1]);
+  }
+  return 0;
+}
+
+// Makes W[1]^E of X, which is 1 in Montgomery form, by a sliding window of w bits.
+void raise(mpi* X, const mpi* E, const mpi_local* W, int w, montgomery* m) {
+  int nbits = 0;
+  int wbits = 0;
+  for (int i = mpi_msb(E) - 1; i >= 0; --i) {
+    const int bit = E->p[i / kLimbBits] >> (i % kLimbBits) & 1;
+    if (bit == 0 && nbits == 0) {
+      m->multiply(X, X);
+      continue;
+    }
+    ++nbits;
+    wbits |= bit << (w - nbits);
+    if (nbits < w) continue;
+    for (int k = 0; k < w; ++k) m->multiply(X, X);
+    m->multiply(X, &W[wbits]);
+    nbits = 0;
+    wbits = 0;
+  }
+  // A window that the exponent's end cut short.
+  for (; nbits > 0; --nbits) {
+    m->multiply(X, X);
+    wbits <<= 1;
+    if ((wbits >> w & 1) != 0) m->multiply(X, &W[1]);
+  }
+}
+
+}  // namespace
