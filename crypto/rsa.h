@@ -1,17 +1,50 @@
-// RSA PKCS#1 v1.5 signature verification (RFC 8017 section 8.2.2) on the tool's own integers.
+// RSA PKCS#1 v1.5 signature verification (RFC 8017 §8.2.2) on the tool's own integers.
+//
+// A context owns the limbs of its two numbers; its owner may release them with mpi_free. Bytes that
+// are passed in are only read during the call. A signature whose digest does not match, or whose
+// digest cannot be told, is logged at error priority; every other refusal is silent.
 #pragma once
 
 #include <cstdint>
 
 #include "crypto/mpi.h"
 
+// A public key.
 struct rsa_context {
-  int32_t len;
-  mpi N;
-  mpi E;
+  int32_t len;  // bytes of the modulus as it was given, and of every signature
+  mpi N;        // the modulus
+  mpi E;        // the public exponent
 };
 
+// Results; 0 is success. The last two are flags on top of a code of the integers.
+inline constexpr int kRsaBadInput = 5;
+inline constexpr int kRsaInvalidPadding = 7;
+inline constexpr int kRsaVerifyFailed = 18;
+inline constexpr int kRsaKeyFlag = 8;
+inline constexpr int kRsaPublicFlag = 16;
+
+// Loads a public key into `ctx`, which is not null and owns no limbs: what it held is not freed.
+//
+// `modulus` is unsigned, big-endian, `len` bytes; null leaves the modulus empty. `exponent` is the
+// same, of the same length; when it is null, `exponent_value`, read as a signed number, is the
+// exponent. A `len` of 0 leaves both numbers empty and the context's `len` as it was. A context
+// with an empty modulus verifies nothing.
+//
+// Returns 0, or kRsaKeyFlag | kMpiNoMemory (9) with both numbers empty.
 int rsa_set_key(rsa_context* ctx, const uint8_t* modulus, const uint8_t* exponent,
                 uint32_t exponent_value, uint32_t len);
-int rsa_pkcs1_verify(rsa_context* ctx, const uint8_t* sha1, const uint8_t* sha256,
+
+// Checks `sig`, of the context's `len` bytes, big-endian, against the digests of the signed data;
+// the signature itself tells which of them it was made for. `sha1` (20 bytes) is required; `sha256`
+// (32 bytes) may be null, and then no SHA-256 signature verifies; `md5` (16 bytes) is not null.
+//
+// Returns 0 when the signature carries the digest, and else
+//   kRsaBadInput (5)        null `ctx`, `sha1` or `sig`; `len` outside 16..512; signature not below
+//                           the modulus
+//   kRsaInvalidPadding (7)  not a block of type 1 (RFC 8017 §9.2), or of no known DigestInfo length
+//                           or MD algorithm, or of SHA-256 where `sha256` is null
+//   kRsaVerifyFailed (18)   another DigestInfo prefix or digest
+//   kRsaPublicFlag | kMpiNoMemory (17), kMpiBadModulus (20: the modulus is even) or
+//                           kMpiBufferTooSmall (24: the result is longer than `len` bytes)
+int rsa_pkcs1_verify(const rsa_context* ctx, const uint8_t* sha1, const uint8_t* sha256,
                      const uint8_t* md5, const uint8_t* sig);
