@@ -1,0 +1,558 @@
+// Signatures by libcrypto, and blocks made by hand and signed with a bare private operation.
+#include "crypto/rsa.h"
+
+#include <gmpxx.h>
+#include <gtest/gtest.h>
+#include <openssl/bn.h>
+#include <openssl/nid.h>
+#include <openssl/rsa.h>
+
+#include <algorithm>
+#include <memory>
+#include <string>
+#include <tuple>
+#include <vector>
+
+#include "support/der.h"
+#include "support/failing_malloc.h"
+#include "support/keys.h"
+#include "support/log_capture.h"
+
+namespace {
+
+const Bytes kMd5(16, 0x55);
+const Bytes kSha1(20, 0x11);
+const Bytes kSha256(32, 0x22);
+
+const Bytes kMd5Info = Concat({FromHex("3020300c06082a864886f70d020505000410"), kMd5});
+const Bytes kSha1Info = Concat({FromHex("3021300906052b0e03021a05000414"), kSha1});
+const Bytes kSha256Info = Concat({FromHex("3031300d060960864801650304020105000420"), kSha256});
+
+const Records kNoRecords;
+
+// A context that releases its numbers.
+struct Context : rsa_context {
+  Context() : rsa_context{} { mpi_init(&N, &E, nullptr); }
+  ~Context() { mpi_free(&N, &E, nullptr); }
+  Context(const Context&) = delete;
+  Context& operator=(const Context&) = delete;
+};
+
+Bytes ToBytes(const BIGNUM* number, size_t length) {
+  Bytes bytes(length);
+  EXPECT_TRUE(BN_bn2bin_padded(bytes.data(), length, number));
+  return bytes;
+}
+
+Bytes ToBytes(const mpz_class& number, size_t length) {
+  const size_t used = (mpz_sizeinbase(number.get_mpz_t(), 2) + 7) / 8;
+  Bytes bytes(length);
+  mpz_export(bytes.data() + (length - used), nullptr, 1, 1, 0, 0, number.get_mpz_t());
+  return bytes;
+}
+
+mpz_class ToNumber(const Bytes& bytes) {
+  mpz_class number;
+  mpz_import(number.get_mpz_t(), bytes.size(), 1, 1, 0, 0, bytes.data());
+  return number;
+}
+
+uint32_t Length(const Bytes& bytes) { return static_cast<uint32_t>(bytes.size()); }
+
+// One of the fixed keys; libcrypto holds its private half.
+struct Key {
+  explicit Key(const std::string& name)
+      : rsa(TestRsaKey(name)),
+        modulus(ToBytes(RSA_get0_n(rsa), RSA_size(rsa))),
+        exponent(static_cast<uint32_t>(BN_get_word(RSA_get0_e(rsa)))) {
+    EXPECT_EQ(0, rsa_set_key(&context, modulus.data(), nullptr, exponent, Length(modulus)));
+  }
+
+  Bytes Sign(int nid, const Bytes& digest) const {
+    Bytes signature(modulus.size());
+    unsigned size = 0;
+    EXPECT_TRUE(RSA_sign(nid, digest.data(), static_cast<unsigned>(digest.size()), signature.data(),
+                         &size, rsa));
+    return signature;
+  }
+
+  // The private operation alone.
+  Bytes SignBlock(const Bytes& block) const {
+    Bytes signature(modulus.size());
+    size_t size = 0;
+    EXPECT_TRUE(RSA_sign_raw(rsa, &size, signature.data(), signature.size(), block.data(),
+                             block.size(), RSA_NO_PADDING));
+    return signature;
+  }
+
+  RSA* rsa;
+  Bytes modulus;
+  uint32_t exponent;
+  Context context;
+};
+
+// A key of a size that libcrypto does not make: two primes from GMP, exponent 65537.
+struct SmallKey {
+  explicit SmallKey(size_t size) {
+    const mpz_class e = 65537;
+    mpz_class p = mpz_class(3) << (4 * size - 2);
+    mpz_class q = mpz_class(7) << (4 * size - 3);
+    mpz_nextprime(p.get_mpz_t(), p.get_mpz_t());
+    mpz_nextprime(q.get_mpz_t(), q.get_mpz_t());
+    n = p * q;
+    const mpz_class phi = (p - 1) * (q - 1);
+    EXPECT_NE(0, mpz_invert(d.get_mpz_t(), e.get_mpz_t(), phi.get_mpz_t()));
+    modulus = ToBytes(n, size);
+    EXPECT_NE(0, modulus[0]);
+    EXPECT_EQ(0, rsa_set_key(&context, modulus.data(), nullptr, 65537, Length(modulus)));
+  }
+
+  Bytes SignBlock(const Bytes& block) const {
+    mpz_class signature;
+    const mpz_class number = ToNumber(block);
+    mpz_powm(signature.get_mpz_t(), number.get_mpz_t(), d.get_mpz_t(), n.get_mpz_t());
+    return ToBytes(signature, modulus.size());
+  }
+
+  mpz_class n;
+  mpz_class d;
+  Bytes modulus;
+  Context context;
+};
+
+// A block of type 1 of `size` bytes.
+Bytes Block(size_t size, const Bytes& info) {
+  return Concat({{0x00, 0x01}, Bytes(size - 3 - info.size(), 0xFF), {0x00}, info});
+}
+
+int Verify(const rsa_context& context, const Bytes& signature) {
+  return rsa_pkcs1_verify(&context, kSha1.data(), kSha256.data(), kMd5.data(), signature.data());
+}
+
+Bytes Flipped(Bytes bytes, size_t index) {
+  bytes[index] ^= 0x01;
+  return bytes;
+}
+
+class RsaPkcs1VerifyKeys : public testing::TestWithParam<std::string> {};
+
+INSTANTIATE_TEST_SUITE_P(Keys, RsaPkcs1VerifyKeys,
+                         testing::Values("rsa-1024", "rsa-1536", "rsa-2048", "rsa-2048-e3",
+                                         "rsa-2048-e17", "rsa-3072", "rsa-4096"),
+                         [](const auto& parameter) {
+                           std::string name = parameter.param;
+                           name.erase(std::remove(name.begin(), name.end(), '-'), name.end());
+                           return name;
+                         });
+
+TEST_P(RsaPkcs1VerifyKeys, SignaturesOfEachDigestVerify) {
+  const Key key(GetParam());
+  LogCapture log;
+  for (const auto& [nid, digest] :
+       {std::pair(NID_md5, kMd5), std::pair(NID_sha1, kSha1), std::pair(NID_sha256, kSha256)}) {
+    const Bytes signature = key.Sign(nid, digest);
+    EXPECT_EQ(0, Verify(key.context, signature)) << nid;
+    EXPECT_EQ(0, Verify(key.context, signature)) << nid << ", again";
+    EXPECT_NE(0, Verify(key.context, Flipped(signature, signature.size() - 1))) << nid;
+    EXPECT_EQ(18, Verify(key.context, key.Sign(nid, Flipped(digest, digest.size() - 1)))) << nid;
+  }
+  EXPECT_EQ(log.records(),
+            Records({Error("MD5 hash does not match"), Error("SHA hash check unsuccessfull"),
+                     Error("SHA256 hash does not match")}));
+}
+
+TEST(RsaPkcs1Verify, Sha256SignatureOfA2048BitKeyVerifiesAndAChangedDigestDoesNot) {
+  const Key key("rsa-2048");
+  ASSERT_EQ(256, key.context.len);
+  const Bytes signature = key.Sign(NID_sha256, kSha256);
+  LogCapture log;
+  EXPECT_EQ(0, Verify(key.context, signature));
+  for (size_t i = 0; i < kSha256.size(); ++i) {
+    log.Clear();
+    EXPECT_EQ(18, rsa_pkcs1_verify(&key.context, kSha1.data(), Flipped(kSha256, i).data(),
+                                   kMd5.data(), signature.data()));
+    EXPECT_EQ(log.records(), Records({Error("SHA256 hash does not match")}));
+  }
+}
+
+TEST(RsaPkcs1Verify, Sha256SignatureWithoutASha256DigestIsInvalidPadding) {
+  const Key key("rsa-2048");
+  LogCapture log;
+  EXPECT_EQ(7, rsa_pkcs1_verify(&key.context, kSha1.data(), nullptr, kMd5.data(),
+                                key.Sign(NID_sha256, kSha256).data()));
+  EXPECT_EQ(log.records(), Records({Error("Invalid padding in RSA")}));
+}
+
+TEST(RsaPkcs1Verify, Sha1AndMd5SignaturesNeedNoSha256Digest) {
+  const Key key("rsa-1024");
+  EXPECT_EQ(0, rsa_pkcs1_verify(&key.context, kSha1.data(), nullptr, kMd5.data(),
+                                key.Sign(NID_sha1, kSha1).data()));
+  EXPECT_EQ(0, rsa_pkcs1_verify(&key.context, kSha1.data(), nullptr, kMd5.data(),
+                                key.Sign(NID_md5, kMd5).data()));
+}
+
+TEST(RsaPkcs1Verify, Sha1SignatureVerifiesAndAChangedDigestDoesNot) {
+  const Key key("rsa-1024");
+  const Bytes signature = key.Sign(NID_sha1, kSha1);
+  LogCapture log;
+  EXPECT_EQ(0, Verify(key.context, signature));
+  for (size_t i = 0; i < kSha1.size(); ++i) {
+    log.Clear();
+    EXPECT_EQ(18, rsa_pkcs1_verify(&key.context, Flipped(kSha1, i).data(), kSha256.data(),
+                                   kMd5.data(), signature.data()));
+    EXPECT_EQ(log.records(), Records({Error("SHA hash check unsuccessfull")}));
+  }
+}
+
+TEST(RsaPkcs1Verify, Md5SignatureVerifiesAndAChangedDigestDoesNot) {
+  const Key key("rsa-1024");
+  const Bytes signature = key.Sign(NID_md5, kMd5);
+  LogCapture log;
+  EXPECT_EQ(0, Verify(key.context, signature));
+  for (size_t i = 0; i < kMd5.size(); ++i) {
+    log.Clear();
+    EXPECT_EQ(18, rsa_pkcs1_verify(&key.context, kSha1.data(), kSha256.data(),
+                                   Flipped(kMd5, i).data(), signature.data()));
+    EXPECT_EQ(log.records(), Records({Error("MD5 hash does not match")}));
+  }
+}
+
+TEST(RsaPkcs1Verify, OtherMdAlgorithmsAreInvalidPadding) {
+  const Key key("rsa-1024");
+  LogCapture log;
+  for (uint8_t algorithm : {0, 2, 4, 6, 255}) {
+    Bytes info = kMd5Info;
+    info[13] = algorithm;
+    log.Clear();
+    EXPECT_EQ(7, Verify(key.context, key.SignBlock(Block(128, info)))) << int{algorithm};
+    EXPECT_EQ(log.records(), Records({Error("Invalid padding in RSA")}));
+  }
+}
+
+TEST(RsaPkcs1Verify, EveryByteOfTheDigestInfoPrefixCounts) {
+  const Key key("rsa-1024");
+  LogCapture log;
+  for (size_t i = 0; i < 19; ++i) {
+    log.Clear();
+    EXPECT_EQ(18, Verify(key.context, key.SignBlock(Block(128, Flipped(kSha256Info, i))))) << i;
+    EXPECT_EQ(log.records(), Records({Error("SHA256 hash does not match")}));
+  }
+  for (size_t i = 0; i < 15; ++i) {
+    log.Clear();
+    EXPECT_EQ(18, Verify(key.context, key.SignBlock(Block(128, Flipped(kSha1Info, i))))) << i;
+    EXPECT_EQ(log.records(), Records({Error("SHA hash check unsuccessfull")}));
+  }
+}
+
+TEST(RsaPkcs1Verify, AnotherMdPrefixFailsSilentlyWhateverTheAlgorithm) {
+  const Key key("rsa-1024");
+  LogCapture log;
+  for (size_t i = 0; i < 18; ++i) {
+    if (i == 13) continue;
+    Bytes info = Flipped(kMd5Info, i);
+    EXPECT_EQ(18, Verify(key.context, key.SignBlock(Block(128, info)))) << i;
+    info[13] = 2;
+    EXPECT_EQ(18, Verify(key.context, key.SignBlock(Block(128, info)))) << i;
+  }
+  EXPECT_EQ(log.records(), kNoRecords);
+}
+
+TEST(RsaPkcs1Verify, EveryByteOfThePaddingCounts) {
+  const Key key("rsa-1024");
+  const Bytes block = Block(128, kSha256Info);
+  const size_t separator = 128 - 1 - kSha256Info.size();
+  ASSERT_EQ(0, Verify(key.context, key.SignBlock(block)));
+  LogCapture log;
+  for (size_t i = 1; i <= separator; ++i) {
+    EXPECT_EQ(7, Verify(key.context, key.SignBlock(Flipped(block, i)))) << i;
+  }
+  EXPECT_EQ(log.records(), kNoRecords);
+}
+
+TEST(RsaPkcs1Verify, BlockThatDoesNotStartWithZeroIsInvalidPadding) {
+  const SmallKey key(54);
+  LogCapture log;
+  Bytes block = Block(54, kSha256Info);
+  block[0] = 0x01;
+  EXPECT_EQ(7, Verify(key.context, key.SignBlock(block)));
+  EXPECT_EQ(log.records(), kNoRecords);
+}
+
+TEST(RsaPkcs1Verify, EmptyPaddingIsAccepted) {
+  const SmallKey key(54);
+  const Bytes block = Block(54, kSha256Info);
+  ASSERT_EQ(0x00, block[2]);
+  EXPECT_EQ(0, Verify(key.context, key.SignBlock(block)));
+}
+
+TEST(RsaPkcs1Verify, EmptyPaddingBeforeALongerInfoIsInvalidPadding) {
+  const SmallKey key(55);
+  LogCapture log;
+  const Bytes block = Block(55, Concat({kSha256Info, {0x00}}));
+  EXPECT_EQ(7, Verify(key.context, key.SignBlock(block)));
+  EXPECT_EQ(log.records(), Records({Error("Invalid padding in RSA")}));
+}
+
+TEST(RsaPkcs1Verify, PaddingOfFewerThanEightBytesIsAccepted) {
+  for (size_t padding = 1; padding < 8; ++padding) {
+    const SmallKey key(54 + padding);
+    EXPECT_EQ(0, Verify(key.context, key.SignBlock(Block(54 + padding, kSha256Info)))) << padding;
+  }
+}
+
+TEST(RsaPkcs1Verify, PaddingWithoutASeparatorIsInvalid) {
+  const Key key("rsa-1024");
+  LogCapture log;
+  const Bytes block = Concat({{0x00, 0x01}, Bytes(126, 0xFF)});
+  EXPECT_EQ(7, Verify(key.context, key.SignBlock(block)));
+  EXPECT_EQ(log.records(), kNoRecords);
+}
+
+TEST(RsaPkcs1Verify, InfoOfAnotherLengthIsInvalidPadding) {
+  const Key key("rsa-1024");
+  LogCapture log;
+  for (size_t length : {0, 1, 33, 36, 50, 52, 125}) {
+    log.Clear();
+    EXPECT_EQ(7, Verify(key.context, key.SignBlock(Block(128, Bytes(length, 0x30))))) << length;
+    EXPECT_EQ(log.records(), Records({Error("Invalid padding in RSA")}));
+  }
+}
+
+TEST(RsaPkcs1Verify, MissingArgumentsAreBadInput) {
+  const Key key("rsa-1024");
+  const Bytes signature = key.Sign(NID_sha1, kSha1);
+  const uint8_t* const sha1 = kSha1.data();
+  const uint8_t* const md5 = kMd5.data();
+  LogCapture log;
+  EXPECT_EQ(5, rsa_pkcs1_verify(nullptr, sha1, nullptr, md5, signature.data()));
+  EXPECT_EQ(5, rsa_pkcs1_verify(&key.context, nullptr, nullptr, md5, signature.data()));
+  EXPECT_EQ(5, rsa_pkcs1_verify(&key.context, sha1, nullptr, md5, nullptr));
+  EXPECT_EQ(log.records(), kNoRecords);
+}
+
+TEST(RsaPkcs1Verify, LengthsOf15And513AreBadInputBeforeAnyArithmetic) {
+  const Bytes modulus(513, 0xFF);
+  const Bytes signature(513, 0x01);
+  for (uint32_t len : {1u, 15u, 513u}) {
+    Context context;
+    ASSERT_EQ(0, rsa_set_key(&context, modulus.data(), nullptr, 3, len));
+    FailingMalloc watch;
+    EXPECT_EQ(5, Verify(context, signature)) << len;
+    EXPECT_EQ(0, watch.calls());
+  }
+}
+
+TEST(RsaPkcs1Verify, NegativeLengthIsBadInput) {
+  Context context;
+  context.len = -1;
+  EXPECT_EQ(5, Verify(context, Bytes(1)));
+}
+
+// A block of 16 bytes has no room for any digest.
+TEST(RsaPkcs1Verify, LengthOf16IsAccepted) {
+  const SmallKey key(16);
+  LogCapture log;
+  EXPECT_EQ(7, Verify(key.context, key.SignBlock(Block(16, Bytes(4, 0x30)))));
+  EXPECT_EQ(log.records(), Records({Error("Invalid padding in RSA")}));
+}
+
+TEST(RsaPkcs1Verify, LengthOf512IsAccepted) {
+  const Key key("rsa-4096");
+  ASSERT_EQ(512, key.context.len);
+  EXPECT_EQ(0, Verify(key.context, key.Sign(NID_sha256, kSha256)));
+}
+
+TEST(RsaPkcs1Verify, SignatureNotBelowTheModulusIsBadInput) {
+  const Key key("rsa-1024");
+  LogCapture log;
+  EXPECT_EQ(5, Verify(key.context, key.modulus));
+  EXPECT_EQ(5, Verify(key.context, ToBytes(mpz_class(ToNumber(key.modulus) + 1), 128)));
+  EXPECT_EQ(5, Verify(key.context, Bytes(128, 0xFF)));
+  EXPECT_EQ(7, Verify(key.context, ToBytes(mpz_class(ToNumber(key.modulus) - 1), 128)));
+  EXPECT_EQ(log.records(), kNoRecords);
+}
+
+TEST(RsaPkcs1Verify, SignatureIsNotBelowANegativeModulus) {
+  Key key("rsa-1024");
+  key.context.N.s = -1;
+  EXPECT_EQ(5, Verify(key.context, key.Sign(NID_sha1, kSha1)));
+}
+
+TEST(RsaPkcs1Verify, EvenModulusReturns20) {
+  Context context;
+  const Bytes modulus(128, 0xFE);
+  ASSERT_EQ(0, rsa_set_key(&context, modulus.data(), nullptr, 65537, 128));
+  LogCapture log;
+  EXPECT_EQ(20, Verify(context, Bytes(128, 0x01)));
+  EXPECT_EQ(log.records(), kNoRecords);
+}
+
+// The length of such a context was changed after the key was set.
+TEST(RsaPkcs1Verify, ResultLongerThanTheLengthReturns24) {
+  Key key("rsa-1024");
+  key.context.len = 127;
+  LogCapture log;
+  EXPECT_EQ(24, Verify(key.context, Bytes(127, 0x7F)));
+  EXPECT_EQ(log.records(), kNoRecords);
+}
+
+TEST(RsaPkcs1Verify, ReportsEachAllocationThatFailsAndLeaksNothing) {
+  const Key key("rsa-1024");
+  const Bytes signature = key.Sign(NID_sha1, kSha1);
+  for (int call = 1;; ++call) {
+    FailingMalloc failing(call);
+    const int result = Verify(key.context, signature);
+    EXPECT_EQ(0, failing.live()) << call;
+    EXPECT_EQ(0, failing.freed_unwiped()) << call;
+    if (!failing.failed()) {
+      EXPECT_EQ(0, result);
+      EXPECT_GT(call, 5);
+      break;
+    }
+    EXPECT_EQ(17, result) << call;
+  }
+}
+
+TEST(RsaPkcs1Verify, NegativeExponentActsAsItsMagnitude) {
+  const Key key("rsa-2048-e17");
+  Context context;
+  ASSERT_EQ(0, rsa_set_key(&context, key.modulus.data(), nullptr, 0u - 17u, 256));
+  EXPECT_EQ(-1, context.E.s);
+  EXPECT_EQ(0, Verify(context, key.Sign(NID_sha256, kSha256)));
+}
+
+TEST(RsaPkcs1Verify, EmptyExponentVerifiesNothing) {
+  const Key key("rsa-1024");
+  Context context;
+  ASSERT_EQ(0, rsa_set_key(&context, key.modulus.data(), nullptr, 0, 128));
+  EXPECT_EQ(0, context.E.n);
+  EXPECT_EQ(7, Verify(context, key.Sign(NID_sha1, kSha1)));
+}
+
+TEST(RsaSetKey, ReadsTheModulusWithoutItsLeadingZeros) {
+  const Bytes modulus = FromHex("0000000102030405060708");
+  Context context;
+  EXPECT_EQ(0, rsa_set_key(&context, modulus.data(), nullptr, 3, Length(modulus)));
+  EXPECT_EQ(11, context.len);
+  ASSERT_EQ(2, context.N.n);
+  EXPECT_EQ(1, context.N.s);
+  EXPECT_EQ(0x05060708u, context.N.p[0]);
+  EXPECT_EQ(0x01020304u, context.N.p[1]);
+  ASSERT_EQ(1, context.E.n);
+  EXPECT_EQ(3u, context.E.p[0]);
+  EXPECT_EQ(1, context.E.s);
+}
+
+TEST(RsaSetKey, ModulusOfZerosIsOneZeroLimb) {
+  const Bytes modulus(16);
+  Context context;
+  EXPECT_EQ(0, rsa_set_key(&context, modulus.data(), nullptr, 3, 16));
+  ASSERT_EQ(1, context.N.n);
+  EXPECT_EQ(0u, context.N.p[0]);
+  EXPECT_EQ(5, Verify(context, Bytes(16)));
+}
+
+TEST(RsaSetKey, LengthOfZeroGivesAnEmptyKeyThatVerifiesNothing) {
+  Context context;
+  context.len = 128;
+  const Bytes modulus(128, 0xFF);
+  EXPECT_EQ(0, rsa_set_key(&context, modulus.data(), nullptr, 3, 0));
+  EXPECT_EQ(128, context.len);
+  EXPECT_EQ(0, context.N.n);
+  EXPECT_EQ(0, context.E.n);
+  EXPECT_EQ(5, Verify(context, Bytes(128)));
+}
+
+TEST(RsaSetKey, NullModulusGivesAnEmptyKeyThatVerifiesNothing) {
+  Context context;
+  EXPECT_EQ(0, rsa_set_key(&context, nullptr, nullptr, 3, 128));
+  EXPECT_EQ(128, context.len);
+  EXPECT_EQ(0, context.N.n);
+  EXPECT_EQ(0, context.E.n);
+  EXPECT_EQ(5, Verify(context, Bytes(128)));
+}
+
+TEST(RsaSetKey, DiscardsWhatTheContextHeld) {
+  const Bytes modulus(16, 0xFF);
+  Context context;
+  context.N = {-1, 7, nullptr};
+  context.E = {-1, 7, nullptr};
+  EXPECT_EQ(0, rsa_set_key(&context, modulus.data(), nullptr, 0, 16));
+  EXPECT_EQ(4, context.N.n);
+  EXPECT_EQ(0, context.E.n);
+}
+
+TEST(RsaSetKey, ReadsTheExponentValueAsASignedNumber) {
+  const Bytes modulus(16, 0xFF);
+  const std::tuple<uint32_t, uint32_t, int> cases[] = {{1, 1, 1},
+                                                       {0x7fffffff, 0x7fffffff, 1},
+                                                       {0x80000000, 0x80000000, -1},
+                                                       {0x80000001, 0x7fffffff, -1},
+                                                       {0xffffffff, 1, -1}};
+  for (const auto& [value, magnitude, sign] : cases) {
+    Context context;
+    EXPECT_EQ(0, rsa_set_key(&context, modulus.data(), nullptr, value, 16));
+    ASSERT_EQ(1, context.E.n);
+    EXPECT_EQ(magnitude, context.E.p[0]);
+    EXPECT_EQ(sign, context.E.s);
+  }
+}
+
+// The exponent's buffer ends where it must not be read further.
+TEST(RsaSetKey, ReadsExactlyAsManyBytesOfTheExponentAsTheModulusHas) {
+  const Key key("rsa-1024");
+  const auto exponent = std::make_unique<uint8_t[]>(128);
+  exponent[125] = 1;
+  exponent[127] = 1;
+  Context context;
+  EXPECT_EQ(0, rsa_set_key(&context, key.modulus.data(), exponent.get(), 3, 128));
+  ASSERT_EQ(1, context.E.n);
+  EXPECT_EQ(65537u, context.E.p[0]);
+  EXPECT_EQ(0, Verify(context, key.Sign(NID_sha256, kSha256)));
+  mpi_free(&context.N, &context.E, nullptr);
+
+  exponent[0] = 0x80;
+  EXPECT_EQ(0, rsa_set_key(&context, key.modulus.data(), exponent.get(), 3, 128));
+  EXPECT_EQ(1024, mpi_msb(&context.E));
+}
+
+TEST(RsaSetKey, WithoutMemoryForModulusOrExponentBytesReturnsNine) {
+  const Bytes modulus(128, 0xFF);
+  const Bytes exponent(128, 0x03);
+  for (int call : {1, 2}) {
+    Context context;
+    FailingMalloc failing(call);
+    EXPECT_EQ(9, rsa_set_key(&context, modulus.data(), exponent.data(), 0, 128));
+    EXPECT_TRUE(failing.failed());
+    EXPECT_EQ(0, failing.live());
+    EXPECT_EQ(0, failing.freed_unwiped());
+    EXPECT_EQ(0, context.N.n);
+    EXPECT_EQ(0, context.E.n);
+  }
+  Context context;
+  FailingMalloc failing(3);
+  EXPECT_EQ(0, rsa_set_key(&context, modulus.data(), exponent.data(), 0, 128));
+  EXPECT_FALSE(failing.failed());
+}
+
+TEST(RsaSetKey, WithoutMemoryForTheExponentValueLeavesItEmpty) {
+  const Bytes modulus(128, 0xFF);
+  Context context;
+  FailingMalloc failing(2);
+  EXPECT_EQ(0, rsa_set_key(&context, modulus.data(), nullptr, 65537, 128));
+  EXPECT_TRUE(failing.failed());
+  EXPECT_EQ(32, context.N.n);
+  EXPECT_EQ(0, context.E.n);
+  EXPECT_EQ(1, context.E.s);
+}
+
+TEST(RsaSetKey, WithoutMemoryForTheModulusReturnsNine) {
+  const Bytes modulus(128, 0xFF);
+  Context context;
+  FailingMalloc failing(1);
+  EXPECT_EQ(9, rsa_set_key(&context, modulus.data(), nullptr, 65537, 128));
+  EXPECT_EQ(0, context.N.n);
+  EXPECT_EQ(0, context.E.n);
+}
+
+}  // namespace
