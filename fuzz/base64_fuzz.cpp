@@ -1,0 +1,27 @@
+// apk/base64.h: any text, into any room, against a decoder that sorts the text first.
+#include "apk/base64.h"
+
+#include "fuzz/fuzz.h"
+#include "fuzz/models.h"
+
+extern "C" int LLVMFuzzerTestOneInput(const uint8_t* data, size_t size) {
+  if (size == 0) return 0;
+  const std::string text(reinterpret_cast<const char*>(data) + 1, size - 1);
+  const std::optional<std::vector<uint8_t>> expected = ReadBase64(text);
+  Require(Base64Decode(text) == (expected.value_or(std::vector<uint8_t>())),
+          "the text decodes to what it stands for");
+
+  const size_t room = data[0] % 64;
+  std::vector<uint8_t> out(room);
+  size_t length = room;
+  const int result = base64decode(text.data(), text.size(), out.data(), &length);
+  Require(result == 0 || result == 1, "base64decode answers 0 or 1");
+  if (result != 0) {
+    Require(length == room, "a failure leaves the length");
+    Require(!expected || expected->size() > room, "a failure has a reason");
+    return 0;
+  }
+  out.resize(length);
+  Require(expected == out, "what fits is decoded the same way");
+  return 0;
+}

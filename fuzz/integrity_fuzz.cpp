@@ -1,0 +1,57 @@
+// sign/integrity.h: any text in the integrity file, on a phone that settles in the end.
+#include "sign/integrity.h"
+
+#include <algorithm>
+#include <string>
+
+#include "fuzz/fuzz.h"
+#include "support/phone.h"
+
+namespace {
+
+void CheckReading(const std::deque<std::string>& texts, uint32_t wait) {
+  Phone phone;
+  phone.integrity = texts;
+  constexpr uint32_t kUntouched = 0x5a5a5a5a;
+  uint32_t value = kUntouched;
+  const uint32_t result = VeltTaskReadIntegrity(0, wait, &value);
+  Require(result == 0 || result == kVeltFailure, "the two codes");
+  Require(result != 0 || wait == 0 || value != 0xFFFFFFFF, "a waiting read ends settled");
+  Require(result == 0 || wait != 0 || value == kUntouched, "a failed read leaves the value");
+  Require(phone.events.size() <= 2 * texts.size(), "no reading after the value has settled");
+}
+
+bool MaySign(const std::deque<std::string>& texts) {
+  Phone phone;
+  phone.integrity = texts;
+  uint32_t value = 0;
+  return VeltTaskReadIntegrity(0, 1, &value) == 0 && value != 0;
+}
+
+void CheckSigning(const std::deque<std::string>& texts) {
+  const bool may_sign = MaySign(texts);
+  Phone phone;
+  phone.integrity = texts;
+  const uint8_t payload[] = {0, 0};
+  const bool told = VeltSignFd(0, payload) == 0;
+  const bool is_signed =
+      std::any_of(phone.events.begin(), phone.events.end(),
+                  [](const std::string& event) { return event.rfind("sign ", 0) == 0; });
+  Require(told == is_signed, "signed and told so, or neither");
+  Require(told == may_sign, "a task signs when its value is settled and not 0");
+}
+
+}  // namespace
+
+extern "C" int LLVMFuzzerTestOneInput(const uint8_t* data, size_t size) {
+  FuzzedDataProvider input(data, size);
+  std::deque<std::string> texts;
+  while (input.remaining_bytes() > 0 && texts.size() < 8) {
+    texts.push_back(input.ConsumeRandomLengthString(32));
+  }
+  texts.push_back("1f\n");
+  CheckReading(texts, 0);
+  CheckReading(texts, 1);
+  CheckSigning(texts);
+  return 0;
+}

@@ -1,0 +1,19 @@
+// apk/manifest_mf.h: any text, against a second reader.
+#include "apk/manifest_mf.h"
+#include "fuzz/fuzz.h"
+#include "fuzz/models.h"
+
+extern "C" int LLVMFuzzerTestOneInput(const uint8_t* data, size_t size) {
+  const std::string text(reinterpret_cast<const char*>(data), size);
+  ManifestMf manifest;
+  const bool valid = manifest.load(text);
+  Require(valid == static_cast<bool>(manifest), "the object knows the result of load()");
+
+  const ManifestModel expected = ReadManifest(text);
+  Require(valid == expected.valid, "both readers take the text, or none");
+  Require(manifest.getSections() == expected.sections, "both readers find the same sections");
+
+  manifest.load(text);
+  Require(manifest.getSections() == expected.sections, "a second load() starts from nothing");
+  return 0;
+}

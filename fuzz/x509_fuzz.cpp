@@ -1,0 +1,88 @@
+// crypto/x509.h: any bytes as a certificate. What the platform's libcrypto reads as well, it must
+// read from the same places.
+#include "crypto/x509.h"
+
+#include <openssl/mem.h>
+#include <openssl/x509.h>
+
+#include <cstring>
+#include <memory>
+
+#include "fuzz/fuzz.h"
+
+namespace {
+
+struct FreeX509 {
+  void operator()(X509* certificate) const { X509_free(certificate); }
+};
+
+void CheckName(const x509_name& name, const uint8_t* data, size_t size) {
+  Require(name.attribute_count <= 20, "no more than 20 attributes");
+  for (uint64_t i = 0; i < name.attribute_count; ++i) {
+    const x509_name_attribute& attribute = name.attributes[i];
+    Require(attribute.type >= 1 && attribute.type <= 8, "an attribute is of a known kind");
+    Require(LiesIn(attribute.value, attribute.value_length, data, size), "an attribute's value");
+    Require(attribute.value_length == 0 ||
+                memchr(attribute.value, 0, attribute.value_length) == nullptr,
+            "no NUL in a name");
+  }
+  Require(LiesIn(name.email, name.email_length, data, size), "email");
+  Require(LiesIn(name.alt_email, name.alt_email_length, data, size), "alt_email");
+  Require(LiesIn(name.dns, name.dns_length, data, size), "dns");
+  Require(LiesIn(name.uri, name.uri_length, data, size), "uri");
+  Require(LiesIn(name.ip, name.ip_length, data, size), "ip");
+  Require(name.rid.len <= 20, "rid");
+}
+
+void CheckRecord(const x509_certificate& record, const uint8_t* data, size_t size) {
+  Require(record.next == nullptr, "the parser chains nothing");
+  Require(record.version <= 2, "version");
+  Require(LiesIn(record.cert_start, record.cert_length, data, size), "certificate");
+  Require(LiesIn(record.tbs_start, record.tbs_length, record.cert_start, record.cert_length),
+          "to-be-signed part");
+  Require(record.public_key != nullptr && LiesIn(record.public_key, record.public_key_length,
+                                                 record.tbs_start, record.tbs_length),
+          "public key");
+  Require(record.signature_value != nullptr &&
+              LiesIn(record.signature_value, record.signature_value_length, record.cert_start,
+                     record.cert_length),
+          "signature");
+  CheckName(record.issuer, data, size);
+  CheckName(record.subject, data, size);
+}
+
+bool Same(const uint8_t* a, uint64_t a_length, const uint8_t* b, int b_length) {
+  return a_length == static_cast<uint64_t>(b_length) && memcmp(a, b, a_length) == 0;
+}
+
+void CompareWithLibcrypto(const x509_certificate& record) {
+  const uint8_t* cursor = record.cert_start;
+  const std::unique_ptr<X509, FreeX509> other(
+      d2i_X509(nullptr, &cursor, static_cast<long>(record.cert_length)));
+  if (other == nullptr) return;
+  const ASN1_BIT_STRING* signature = nullptr;
+  X509_get0_signature(&signature, nullptr, other.get());
+  Require(Same(record.signature_value, record.signature_value_length, signature->data,
+               signature->length),
+          "the same signature");
+  const ASN1_BIT_STRING* key = X509_get0_pubkey_bitstr(other.get());
+  Require(Same(record.public_key, record.public_key_length, key->data, key->length),
+          "the same public key");
+  uint8_t* tbs = nullptr;
+  const int tbs_length = i2d_X509_tbs(other.get(), &tbs);
+  if (tbs_length <= 0) return;
+  Require(Same(record.tbs_start, record.tbs_length, tbs, tbs_length), "the same signed bytes");
+  OPENSSL_free(tbs);
+}
+
+}  // namespace
+
+extern "C" int LLVMFuzzerTestOneInput(const uint8_t* data, size_t size) {
+  x509_certificate record;
+  const int result = x509_certificate_parse(data, size, &record);
+  Require(result <= 0 && result >= -15, "a known code");
+  if (result != 0) return 0;
+  CheckRecord(record, data, size);
+  CompareWithLibcrypto(record);
+  return 0;
+}
