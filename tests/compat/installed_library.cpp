@@ -68,6 +68,12 @@ int32_t Extract(void* archive, const Entry& entry, uint8_t* begin, uint32_t size
   return ExtractToMemory(Handle(archive), &copy, begin, size);
 }
 
+int32_t Process(void* archive, const Entry& entry,
+                bool (*function)(const uint8_t* buffer, size_t size, void* cookie), void* cookie) {
+  ZipEntry copy = ToLibrary(entry);
+  return ProcessZipEntryContents(Handle(archive), &copy, function, cookie);
+}
+
 int Descriptor(void* archive) { return GetFileDescriptor(Handle(archive)); }
 
 }  // namespace installed

@@ -5,6 +5,7 @@
 
 #include <sys/types.h>
 
+#include <cstddef>
 #include <cstdint>
 #include <string_view>
 
@@ -29,6 +30,8 @@ int32_t Find(void* archive, std::string_view name, Entry* entry);
 int32_t Start(void* archive, void** cookie, std::string_view prefix, std::string_view suffix);
 int32_t Advance(void* cookie, Entry* entry, std::string_view* name);
 int32_t Extract(void* archive, const Entry& entry, uint8_t* begin, uint32_t size);
+int32_t Process(void* archive, const Entry& entry,
+                bool (*function)(const uint8_t* buffer, size_t size, void* cookie), void* cookie);
 int Descriptor(void* archive);
 
 }  // namespace installed

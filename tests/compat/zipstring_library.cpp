@@ -84,4 +84,9 @@ int32_t ExtractToMemory(ZipArchiveHandle archive, ZipEntry* entry, uint8_t* begi
   return installed::Extract(archive, ToInstalled(*entry), begin, size);
 }
 
+int32_t ProcessZipEntryContents(ZipArchiveHandle archive, ZipEntry* entry,
+                                ProcessZipEntryFunction function, void* cookie) {
+  return installed::Process(archive, ToInstalled(*entry), function, cookie);
+}
+
 int GetFileDescriptor(ZipArchiveHandle archive) { return installed::Descriptor(archive); }

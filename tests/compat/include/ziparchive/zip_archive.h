@@ -8,6 +8,7 @@
 
 #include <sys/types.h>
 
+#include <cstddef>
 #include <cstdint>
 
 // `name` is not NUL-terminated.
@@ -22,6 +23,11 @@ struct ZipString {
   bool operator==(const ZipString& other) const;
   bool StartsWith(const ZipString& prefix) const;
   bool EndsWith(const ZipString& suffix) const;
+};
+
+enum {
+  kCompressStored = 0,
+  kCompressDeflated = 8,
 };
 
 struct ZipEntry {
@@ -49,6 +55,10 @@ int32_t StartIteration(ZipArchiveHandle archive, void** cookie, const ZipString*
 int32_t Next(void* cookie, ZipEntry* data, ZipString* name);
 
 int32_t ExtractToMemory(ZipArchiveHandle archive, ZipEntry* entry, uint8_t* begin, uint32_t size);
+
+using ProcessZipEntryFunction = bool (*)(const uint8_t* buffer, size_t size, void* cookie);
+int32_t ProcessZipEntryContents(ZipArchiveHandle archive, ZipEntry* entry,
+                                ProcessZipEntryFunction function, void* cookie);
 
 int GetFileDescriptor(ZipArchiveHandle archive);
 
