@@ -1,0 +1,124 @@
+// How the tool is started, and what keeps it from starting on a file.
+#include <gtest/gtest.h>
+#include <unistd.h>
+
+#include <cerrno>
+#include <cstring>
+#include <filesystem>
+#include <regex>
+
+#include "journeys/simulation.h"
+#include "journeys/timeline.h"
+#include "support/package.h"
+
+namespace {
+
+// A good package with its library.
+class CommandLine : public testing::Test {
+ protected:
+  CommandLine() { SignPackage().WriteTo(apk_); }
+
+  const Folder folder_;
+  const std::string apk_ = folder_ / "base.apk";
+  const std::string library_ = folder_.Write("lib/arm64/libfoo.so", ToBytes("\177ELF foo"));
+};
+
+void ExpectUsageError(const std::vector<std::string>& arguments) {
+  std::vector<std::string> command = {ToolPath()};
+  command.insert(command.end(), arguments.begin(), arguments.end());
+  const ProcessResult run = RunProcess(command);
+  EXPECT_EQ(run.status, 1);
+  EXPECT_EQ(run.output, "");
+  EXPECT_EQ(run.errors, "");
+}
+
+TEST_F(CommandLine, WithoutAPathIsAUsageError) { ExpectUsageError({}); }
+
+TEST_F(CommandLine, WithTwoPathsIsAUsageError) { ExpectUsageError({apk_, apk_}); }
+
+TEST_F(CommandLine, MissingFileEndsSilently) {
+  const Simulation run = Simulate(folder_ / "none.apk");
+
+  EXPECT_EQ(run.timeline, Exit(0));
+  EXPECT_EQ(run.status, 1);  // the file was not signed
+}
+
+// In a user namespace of its own the tool has no right to another user's files, not even as root.
+TEST_F(CommandLine, FileThatMayNotBeReadEndsSilently) {
+  std::filesystem::permissions(apk_, std::filesystem::perms::none);
+
+  const Simulation run = Simulate(apk_, {}, {{"unshare", "-U"}, {}});
+
+  EXPECT_EQ(run.timeline, Exit(0));
+  EXPECT_EQ(run.status, 1);  // the file was not signed
+}
+
+// The words that run a command with `package` copied to `mount_point`/base.apk, on a file system of
+// its own that takes `options`.
+std::vector<std::string> OnItsOwnFileSystem(const std::string& package,
+                                            const std::string& mount_point,
+                                            const std::string& options) {
+  const std::string script =
+      "mount -t tmpfs apktoolkit \"$0\" && cp \"$1\" \"$0/base.apk\" &&"
+      " mount -o remount," +
+      options + " \"$0\" && shift && exec \"$@\"";
+  const char* const namespaces = geteuid() == 0 ? "-m" : "-Urm";
+  return {"unshare", namespaces, "sh", "-c", script, mount_point, package};
+}
+
+TEST_F(CommandLine, FileOnAReadOnlyFileSystemEndsSilently) {
+  const Folder mount_point;
+  const std::string apk = mount_point / "base.apk";
+
+  const Simulation run =
+      Simulate(apk, {}, {OnItsOwnFileSystem(apk_, mount_point.path(), "ro"), {}});
+
+  EXPECT_EQ(run.timeline, Exit(0));
+  EXPECT_EQ(run.status, 1);  // the file was not signed
+}
+
+TEST_F(CommandLine, FileOnTheSameFileSystemWritableIsWorkedOn) {
+  const Folder mount_point;
+  const std::string apk = mount_point / "base.apk";
+  const std::string library = mount_point / "lib/arm64/libfoo.so";
+
+  const Simulation run =
+      Simulate(apk, {}, {OnItsOwnFileSystem(apk_, mount_point.path(), "rw"), {}});
+
+  EXPECT_EQ(run.timeline,
+            Timeline({LibraryStep({Log(6, "Can't open file: " + library + "\n"),
+                                   Log(6, "VeltSignJni: File not verified: " + library + "\n")}),
+                      PackageStep(apk), Exit(0)}));
+}
+
+// The log as the workstation's library prints it, less the time and the process: a letter for the
+// priority, then the text.
+std::string WorkstationLog(const std::string& errors) {
+  return std::regex_replace(
+      errors, std::regex("ApkToolkit ([A-Z]) [0-9]+-[0-9]+ [0-9:]+ +[0-9]+ +[0-9]+ "), "$1 ");
+}
+
+TEST_F(CommandLine, WithoutASimulatedPhoneNothingCanBeSigned) {
+  PackageOptions options;
+  options.secure_storage = true;
+  SignPackage(options).WriteTo(apk_);
+  const std::string not_signed = std::string("E VELT can't sign a file (result=10000, errno 2: ") +
+                                 strerror(ENOENT) + ").\n\n";
+
+  const ProcessResult run = RunProcess({ToolPath(), apk_});
+
+  EXPECT_EQ(WorkstationLog(run.errors),
+            "I VeltSignJni starts: 3.\n\n"
+            "I VeltSignOat: Apk case.\n\n" +
+                not_signed +
+                "I VeltSignJni finished: 0.\n\n"
+                "I VeltSign starts: zip_fd = 3, fd = 3.\n\n"
+                "I VeltSignOat: Apk case.\n\n" +
+                not_signed +
+                "I VeltSign finished: 65536.\n\n"
+                "E ZuAddCertificate: ZuNewCertificate failed -1.\n\n");
+  EXPECT_EQ(run.output, "");
+  EXPECT_EQ(run.status, 0);
+}
+
+}  // namespace

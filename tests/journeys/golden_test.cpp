@@ -1,0 +1,117 @@
+// Packages that other people's tools packed and signed (make_golden_packages).
+#include <gtest/gtest.h>
+
+#include <cctype>
+#include <fstream>
+
+#include "journeys/simulation.h"
+#include "journeys/timeline.h"
+
+namespace {
+
+std::string Golden(const std::string& name) { return std::string(GOLDEN_PACKAGES) + "/" + name; }
+
+Bytes ReadHex(const std::string& path) {
+  std::ifstream file(path);
+  std::string digits;
+  file >> digits;
+  Bytes bytes;
+  for (size_t i = 0; i + 1 < digits.size(); i += 2) {
+    bytes.push_back(static_cast<uint8_t>(std::stoul(digits.substr(i, 2), nullptr, 16)));
+  }
+  return bytes;
+}
+
+class GoldenPackage : public testing::TestWithParam<const char*> {};
+
+std::string TestName(const testing::TestParamInfo<const char*>& package) {
+  std::string name;
+  bool capital = true;
+  for (const char* c = package.param; *c != 0; ++c) {
+    if (*c != '-') name += capital ? static_cast<char>(toupper(*c)) : *c;
+    capital = *c == '-';
+  }
+  return name;
+}
+
+// What the kernel and libzu get is what openssl says of the signer's certificate.
+TEST_P(GoldenPackage, IsSignedWithItsLibrariesAndRegistered) {
+  const std::string folder = Golden(GetParam());
+  const std::string apk = folder + "/base.apk";
+  const Bytes modulus = ReadHex(folder + "/modulus");
+  Bytes payload = {32, 0};
+  const Bytes digest = ReadHex(folder + "/digest");
+  payload.insert(payload.end(), digest.begin(), digest.end());
+  ASSERT_EQ(payload.size(), 34U);
+  ASSERT_GE(modulus.size(), 256U);
+
+  const Simulation run = Simulate(apk);
+
+  std::string first = folder + "/lib/arm64/libvault.so";
+  std::string second = folder + "/lib/arm/libvault.so";
+  // The zip library's order of entries is its own.
+  if (run.timeline.find(second) < run.timeline.find(first)) std::swap(first, second);
+  EXPECT_EQ(run.timeline,
+            Timeline({LibraryStep({SignedLibrary(first, payload), SignedLibrary(second, payload)}),
+                      PackageStep(apk, payload), Register(3, apk, "com.example.vault", modulus),
+                      Log(4, "ZuAddCertificate: ZuNewCertificate return 0.\n"), Exit(0)}));
+  EXPECT_EQ(run.status, 0);
+}
+
+INSTANTIATE_TEST_SUITE_P(By, GoldenPackage,
+                         testing::Values("apksigner-sha256-2048", "apksigner-sha1-2048",
+                                         "apksigner-sha256-4096", "apksigner-sha1-4096",
+                                         "openssl-smime-sha256", "openssl-cms-sha1",
+                                         "openssl-cms-md5", "openssl-cms-keyid"),
+                         TestName);
+
+// The text of the signature block, as openssl prints its structure.
+std::string BlockStructure(const std::string& name) {
+  const ProcessResult run = RunProcess(
+      {"sh", "-c", "unzip -p \"$0/base.apk\" META-INF/CERT.RSA | openssl asn1parse -inform DER",
+       Golden(name)});
+  EXPECT_EQ(run.status, 0) << run.errors;
+  return run.output;
+}
+
+void ExpectRefusalAfter(const std::string& name, std::initializer_list<std::string> reasons) {
+  const std::string apk = Golden(name) + "/base.apk";
+  const Simulation run = Simulate(apk);
+  EXPECT_EQ(run.timeline, Timeline({Timeline(reasons), NothingSigned(apk), Exit(0)}));
+  EXPECT_EQ(run.status, 1);
+}
+
+class BlockWithAttributes : public testing::TestWithParam<const char*> {};
+
+// The element after the attributes is taken for the signature, and no padding comes out of it.
+TEST_P(BlockWithAttributes, IsRefused) {
+  ASSERT_NE(BlockStructure(GetParam()).find(":messageDigest"), std::string::npos);
+
+  ExpectRefusalAfter(GetParam(), {Log(6, "RSA could not verify data: 7\n"),
+                                  Log(6, "file not verified: META-INF/CERT.SF\n")});
+}
+
+INSTANTIATE_TEST_SUITE_P(By, BlockWithAttributes,
+                         testing::Values("jarsigner-sha256", "jarsigner-sha1",
+                                         "openssl-cms-attributes"),
+                         TestName);
+
+TEST(RefusedGoldenPackage, SignedWithALongerDigestHasInvalidPadding) {
+  ASSERT_NE(BlockStructure("openssl-cms-sha512").find(":sha512"), std::string::npos);
+
+  ExpectRefusalAfter("openssl-cms-sha512",
+                     {Log(6, "Invalid padding in RSA"), Log(6, "RSA could not verify data: 7\n"),
+                      Log(6, "file not verified: META-INF/CERT.SF\n")});
+}
+
+TEST(RefusedGoldenPackage, WithACertificateThatAnotherIssuedIsRefused) {
+  ExpectRefusalAfter("openssl-cms-issued", {Log(6, "RSA could not verify certificate: 7\n"),
+                                            Log(6, "file not verified: META-INF/CERT.SF\n")});
+}
+
+TEST(RefusedGoldenPackage, SignedWithAnEllipticCurveHasNoRsaBlock) {
+  ExpectRefusalAfter("apksigner-ec",
+                     {Log(6, "Can't extract RSA certificate: META-INF/CERT.RSA\n")});
+}
+
+}  // namespace

@@ -1,0 +1,166 @@
+// Packages that verify: what is signed and registered, with what, and in which order.
+#include <gtest/gtest.h>
+
+#include <filesystem>
+
+#include "journeys/simulation.h"
+#include "journeys/timeline.h"
+#include "support/package.h"
+
+namespace {
+
+const Bytes kLibrary = ToBytes("\177ELF foo");
+
+// A good package with this one native library.
+PackageOptions WithLibrary(const std::string& entry_name) {
+  PackageOptions options;
+  options.entries = {{"classes.dex", ToBytes("dex\n035")}, {entry_name, kLibrary}};
+  return options;
+}
+
+TEST(GoodPackage, LibraryIsSignedThenThePackageThenItsKeyIsRegistered) {
+  const Folder folder;
+  const std::string apk = folder / "base.apk";
+  const std::string library = folder.Write("lib/arm64/libfoo.so", kLibrary);
+  PackageOptions options = WithLibrary("lib/arm64-v8a/libfoo.so");
+  options.secure_storage = true;
+  SignPackage(options).WriteTo(apk);
+
+  const Simulation run = Simulate(apk);
+
+  EXPECT_EQ(run.timeline, Timeline({Log(4, "VeltSignJni starts: 3.\n"),                          //
+                                    Log(4, "VeltSignOat: Apk case.\n"),                          //
+                                    Integrity("1f"),                                             //
+                                    Sign(4, library, PackagePayload()),                          //
+                                    Log(4, "VeltSignJni finished: 0.\n"),                        //
+                                    Log(4, "VeltSign starts: zip_fd = 3, fd = 3.\n"),            //
+                                    Log(4, "VeltSignOat: Apk case.\n"),                          //
+                                    Integrity("1f"),                                             //
+                                    Sign(3, apk, PackagePayload()),                              //
+                                    Log(4, "VeltSign finished: 0.\n"),                           //
+                                    Register(3, apk, "com.example.app", ModulusOf("rsa-2048")),  //
+                                    Log(4, "ZuAddCertificate: ZuNewCertificate return 0.\n"),    //
+                                    Exit(0)}));
+  EXPECT_EQ(run.status, 0);
+}
+
+TEST(GoodPackage, WithoutThePermissionItIsNotRegistered) {
+  const Folder folder;
+  const std::string apk = folder / "base.apk";
+  const std::string library = folder.Write("lib/arm64/libfoo.so", kLibrary);
+  SignPackage(WithLibrary("lib/arm64-v8a/libfoo.so")).WriteTo(apk);
+
+  const Simulation run = Simulate(apk);
+
+  EXPECT_EQ(run.timeline,
+            Timeline({LibraryStep({SignedLibrary(library)}), PackageStep(apk), Exit(0)}));
+  EXPECT_EQ(run.status, 0);
+}
+
+TEST(GoodPackage, WithoutLibrariesOnlyThePackageIsSigned) {
+  const Folder folder;
+  const std::string apk = folder / "base.apk";
+  PackageOptions options;
+  options.entries = {{"classes.dex", ToBytes("dex\n035")}};
+  SignPackage(options).WriteTo(apk);
+
+  const Simulation run = Simulate(apk);
+
+  EXPECT_EQ(run.timeline, Timeline({LibraryStep(), PackageStep(apk), Exit(0)}));
+  EXPECT_EQ(run.status, 0);
+}
+
+TEST(GoodPackage, WithoutADexFileIsGood) {
+  const Folder folder;
+  const std::string apk = folder / "base.apk";
+  PackageOptions options;
+  options.entries = {};
+  SignPackage(options).WriteTo(apk);
+
+  const Simulation run = Simulate(apk);
+
+  EXPECT_EQ(run.timeline, Timeline({LibraryStep(), PackageStep(apk), Exit(0)}));
+  EXPECT_EQ(run.status, 0);
+}
+
+struct Row {
+  const char* description;
+  const char* entry_name;
+  const char* installed;
+};
+
+class LibraryDirectory : public testing::TestWithParam<Row> {};
+
+TEST_P(LibraryDirectory, IsWhereTheEntryIsSigned) {
+  const Folder folder;
+  const std::string apk = folder / "base.apk";
+  const std::string library = folder.Write(GetParam().installed, kLibrary);
+  SignPackage(WithLibrary(GetParam().entry_name)).WriteTo(apk);
+
+  const Simulation run = Simulate(apk);
+
+  EXPECT_EQ(run.timeline,
+            Timeline({LibraryStep({SignedLibrary(library)}), PackageStep(apk), Exit(0)}));
+  EXPECT_EQ(run.status, 0);
+}
+
+INSTANTIATE_TEST_SUITE_P(
+    Rows, LibraryDirectory,
+    testing::Values(Row{"ArmeabiV7a", "lib/armeabi-v7a/libfoo.so", "lib/arm/libfoo.so"},
+                    Row{"ArmeabiV8a", "lib/armeabi-v8a/libfoo.so", "lib/arm64/libfoo.so"},
+                    Row{"Arm64V8a", "lib/arm64-v8a/libfoo.so", "lib/arm64/libfoo.so"},
+                    Row{"Armeabi", "lib/armeabi/libfoo.so", "lib/arm/libfoo.so"},
+                    Row{"NoSeparatorAfterThePrefix", "lib/armeabiX/libfoo.so",
+                        "lib/armX/libfoo.so"}),
+    [](const auto& row) { return row.param.description; });
+
+class NoLibrary : public testing::TestWithParam<Row> {};
+
+TEST_P(NoLibrary, IsPassedOverSilently) {
+  const Folder folder;
+  const std::string apk = folder / "base.apk";
+  folder.Write(GetParam().installed, kLibrary);
+  SignPackage(WithLibrary(GetParam().entry_name)).WriteTo(apk);
+
+  const Simulation run = Simulate(apk);
+
+  EXPECT_EQ(run.timeline, Timeline({LibraryStep(), PackageStep(apk), Exit(0)}));
+  EXPECT_EQ(run.status, 0);
+}
+
+INSTANTIATE_TEST_SUITE_P(
+    Rows, NoLibrary,
+    testing::Values(Row{"OtherProcessor", "lib/x86/libfoo.so", "lib/x86/libfoo.so"},
+                    Row{"OtherSuffix", "lib/arm64-v8a/libfoo.so.1", "lib/arm64/libfoo.so.1"},
+                    Row{"OtherFolder", "assets/lib/arm64-v8a/libfoo.so", "lib/arm64/libfoo.so"}),
+    [](const auto& row) { return row.param.description; });
+
+TEST(GoodPackage, NamedWithoutAFolderIsFoundThroughItsDescriptor) {
+  const Folder folder;
+  const std::string apk = folder / "base.apk";
+  const std::string library = folder.Write("lib/arm64/libfoo.so", kLibrary);
+  SignPackage(WithLibrary("lib/arm64-v8a/libfoo.so")).WriteTo(apk);
+
+  const Simulation run = Simulate("base.apk", {}, {{}, folder.path()});
+
+  EXPECT_EQ(run.timeline,
+            Timeline({LibraryStep({SignedLibrary(library)}), PackageStep(apk), Exit(0)}));
+  EXPECT_EQ(run.status, 0);
+}
+
+TEST(GoodPackage, ReachedThroughALinkHasItsLibrariesBesideTheFileItself) {
+  const Folder folder;
+  const std::string apk = folder / "base.apk";
+  const std::string library = folder.Write("lib/arm64/libfoo.so", kLibrary);
+  SignPackage(WithLibrary("lib/arm64-v8a/libfoo.so")).WriteTo(apk);
+  const Folder elsewhere;
+  std::filesystem::create_symlink(apk, elsewhere / "link.apk");
+
+  const Simulation run = Simulate(elsewhere / "link.apk");
+
+  EXPECT_EQ(run.timeline,
+            Timeline({LibraryStep({SignedLibrary(library)}), PackageStep(apk), Exit(0)}));
+  EXPECT_EQ(run.status, 0);
+}
+
+}  // namespace

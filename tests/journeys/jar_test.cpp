@@ -1,0 +1,257 @@
+// JARs, which the kernel has to trust already, and other files that are no packages.
+#include <gtest/gtest.h>
+#include <openssl/sha.h>
+#include <sys/xattr.h>
+
+#include <cerrno>
+#include <cstring>
+
+#include "journeys/simulation.h"
+#include "journeys/timeline.h"
+#include "support/package.h"
+
+namespace {
+
+const Bytes kEmptyPayload = {0, 0};
+
+void WriteJar(const std::string& path) {
+  PackageOptions options;
+  options.android_manifest = Bytes();
+  options.entries = {{"classes.dex", ToBytes("dex\n035")}};
+  SignPackage(options).WriteTo(path);
+}
+
+// A folder on a file system that keeps extended attributes of users.
+std::string PlaceForAttributes() {
+  for (const char* place : {"/tmp", "/var/tmp", "/dev/shm", "."}) {
+    const Folder folder(place);
+    const std::string file = folder.Write("probe", {});
+    if (setxattr(file.c_str(), "user.zu", "1", 1, 0) == 0) return place;
+  }
+  ADD_FAILURE() << "no file system with extended attributes of users";
+  return "/tmp";
+}
+
+void SetAttribute(const std::string& path, const std::string& value) {
+  ASSERT_EQ(setxattr(path.c_str(), "user.zu", value.data(), value.size(), 0), 0) << strerror(errno);
+}
+
+// What a JAR is registered with: four digests, the first of its path, each other of the one before.
+Bytes KeyBlock(const std::string& path) {
+  Bytes block(4 * SHA256_DIGEST_LENGTH);
+  SHA256(reinterpret_cast<const uint8_t*>(path.data()), path.size(), &block[0]);
+  SHA256(&block[0], 32, &block[32]);
+  SHA256(&block[32], 32, &block[64]);
+  SHA256(&block[64], 32, &block[96]);
+  return block;
+}
+
+// The timeline up to the kernel's answer.
+std::string JarUpToVerify(const std::string& path, int refusal = 0) {
+  return Timeline({Log(6, "Can't extract Android Manifest: Entry not found\n"),
+                   Log(4, "VeltSignJni starts: 3.\n"),
+                   Log(6, "VeltSignJni: malformed apk: " + path + "\n"),
+                   Log(4, "VeltSign starts: zip_fd = 3, fd = 3.\n"),
+                   Log(4, "VeltSignOat: non-Apk (Jar) case\n"), Verify(3, path, refusal)});
+}
+
+std::string SignedJar(const std::string& path) {
+  return Timeline({JarUpToVerify(path), Integrity("1f"), Sign(3, path, kEmptyPayload),
+                   Log(4, "VeltSign finished: 0.\n")});
+}
+
+std::string UntrustedJar(const std::string& path, int refusal = ENOKEY) {
+  return Timeline({JarUpToVerify(path, refusal),
+                   Log(4, "VELT can't verify a file " + std::to_string(refusal) + ": /" +
+                              strerror(refusal) + ".\n"),
+                   Log(4, "VeltSign finished: 65536.\n")});
+}
+
+std::string RegisteredJar(const std::string& path) {
+  return Timeline({Log(4, "ZuAddCertificate: Call ZuNewCertificate for JAR.\n"),
+                   Register(3, path, path, KeyBlock(path)),
+                   Log(4, "ZuAddCertificate: ZuNewCertificate return 0.\n")});
+}
+
+TEST(Jar, TrustedIsSignedWithAnEmptyPayload) {
+  const Folder folder;
+  const std::string jar = folder / "framework.jar";
+  WriteJar(jar);
+
+  const Simulation run = Simulate(jar, {"--trust", jar});
+
+  EXPECT_EQ(run.timeline,
+            Timeline({Log(6, "Can't extract Android Manifest: Entry not found\n"),
+                      Log(4, "VeltSignJni starts: 3.\n"),
+                      Log(6, "VeltSignJni: malformed apk: " + jar + "\n"),
+                      Log(4, "VeltSign starts: zip_fd = 3, fd = 3.\n"),
+                      Log(4, "VeltSignOat: non-Apk (Jar) case\n"), Verify(3, jar), Integrity("1f"),
+                      Sign(3, jar, {0, 0}), Log(4, "VeltSign finished: 0.\n"), Exit(0)}));
+  EXPECT_EQ(run.status, 0);
+}
+
+TEST(Jar, NotTrustedIsNotSigned) {
+  const Folder folder;
+  const std::string jar = folder / "framework.jar";
+  WriteJar(jar);
+
+  const Simulation run = Simulate(jar);
+
+  EXPECT_EQ(run.timeline, Timeline({UntrustedJar(jar), Exit(0)}));
+  EXPECT_EQ(run.status, 1);
+}
+
+TEST(Jar, TheKernelsReasonIsLogged) {
+  const Folder folder;
+  const std::string jar = folder / "framework.jar";
+  WriteJar(jar);
+
+  const Simulation run = Simulate(jar, {"--verify-errno", "EKEYREVOKED"});
+
+  EXPECT_EQ(run.timeline, Timeline({UntrustedJar(jar, EKEYREVOKED), Exit(0)}));
+  EXPECT_EQ(run.status, 1);
+}
+
+TEST(Jar, TrustedWithTheAttributeIsSignedAndRegisteredUnderItsPath) {
+  const Folder folder(PlaceForAttributes());
+  const std::string jar = folder / "framework.jar";
+  WriteJar(jar);
+  SetAttribute(jar, "1");
+
+  const Simulation run = Simulate(jar, {"--trust", jar});
+
+  EXPECT_EQ(run.timeline, Timeline({SignedJar(jar), RegisteredJar(jar), Exit(0)}));
+  EXPECT_EQ(run.status, 0);
+}
+
+TEST(Jar, NotTrustedWithTheAttributeIsRegisteredAllTheSame) {
+  const Folder folder(PlaceForAttributes());
+  const std::string jar = folder / "framework.jar";
+  WriteJar(jar);
+  SetAttribute(jar, "1");
+
+  const Simulation run = Simulate(jar);
+
+  EXPECT_EQ(run.timeline, Timeline({UntrustedJar(jar), RegisteredJar(jar), Exit(0)}));
+  EXPECT_EQ(run.status, 1);
+}
+
+TEST(Jar, WithAnEmptyAttributeIsNotRegistered) {
+  const Folder folder(PlaceForAttributes());
+  const std::string jar = folder / "framework.jar";
+  WriteJar(jar);
+  SetAttribute(jar, "");
+
+  const Simulation run = Simulate(jar, {"--trust", jar});
+
+  EXPECT_EQ(run.timeline, Timeline({SignedJar(jar), Exit(0)}));
+  EXPECT_EQ(run.status, 0);
+}
+
+TEST(Jar, RefusedRegistrationIsLogged) {
+  const Folder folder(PlaceForAttributes());
+  const std::string jar = folder / "framework.jar";
+  WriteJar(jar);
+  SetAttribute(jar, "1");
+
+  const Simulation run = Simulate(jar, {"--trust", jar, "--zu-result", "-5"});
+
+  EXPECT_EQ(run.timeline,
+            Timeline({SignedJar(jar), Log(4, "ZuAddCertificate: Call ZuNewCertificate for JAR.\n"),
+                      Register(3, jar, jar, KeyBlock(jar), -5),
+                      Log(6, "ZuAddCertificate: ZuNewCertificate failed -5.\n"), Exit(0)}));
+  EXPECT_EQ(run.status, 1);
+}
+
+TEST(Jar, RefusedSignatureIsLogged) {
+  const Folder folder;
+  const std::string jar = folder / "framework.jar";
+  WriteJar(jar);
+
+  const Simulation run = Simulate(jar, {"--trust", jar, "--sign-errno", "EPERM"});
+
+  EXPECT_EQ(
+      run.timeline,
+      Timeline({JarUpToVerify(jar), Integrity("1f"), Sign(3, jar, kEmptyPayload, EPERM),
+                Log(6, std::string("VELT can't sign a non-APK file (result=10000, errno 1: ") +
+                           strerror(EPERM) + ").\n"),
+                Log(4, "VeltSign finished: 65536.\n"), Exit(0)}));
+  EXPECT_EQ(run.status, 1);
+}
+
+TEST(Jar, TamperedSignatureDoesNotMatterToOneThatIsTrusted) {
+  const Folder folder;
+  const std::string jar = folder / "framework.jar";
+  PackageOptions options;
+  options.android_manifest = Bytes();
+  Package package = SignPackage(options);
+  package.Tamper(kManifestName);
+  package.WriteTo(jar);
+
+  const Simulation run = Simulate(jar, {"--trust", jar});
+
+  EXPECT_EQ(run.timeline, Timeline({SignedJar(jar), Exit(0)}));
+  EXPECT_EQ(run.status, 0);
+}
+
+// What follows when the zip library refuses the file.
+std::string NotAnArchive(const std::string& path, const std::string& reason) {
+  return Timeline({Log(6, "OpenArchiveFd(3) [file: " + path + "] returned: " + reason + "\n"),
+                   Log(4, "VeltSignJni starts: 3.\n"),
+                   Log(6, "VeltSignJni: malformed apk: " + path + "\n"),
+                   Log(4, "VeltSign starts: zip_fd = 3, fd = 3.\n"),
+                   Log(6, "Zip archive is not valid for fd=3\n"), Exit(0)});
+}
+
+TEST(OtherFile, ThatIsNoArchiveIsRefusedByEachStep) {
+  const Folder folder;
+  const std::string file = folder.Write("notes.txt", Bytes(1000, 'x'));
+
+  const Simulation run = Simulate(file, {"--trust", file});
+
+  EXPECT_EQ(run.timeline, NotAnArchive(file, "-3: Invalid file"));
+  EXPECT_EQ(run.status, 1);
+}
+
+TEST(OtherFile, ThatIsEmptyIsRefusedByEachStep) {
+  const Folder folder;
+  const std::string file = folder.Write("empty.apk", {});
+
+  const Simulation run = Simulate(file, {"--trust", file});
+
+  EXPECT_EQ(run.timeline, NotAnArchive(file, "-3: Invalid file"));
+  EXPECT_EQ(run.status, 1);
+}
+
+// The end-of-central-directory record alone.
+TEST(OtherFile, ThatIsAnArchiveWithoutEntriesIsRefusedByEachStep) {
+  const Folder folder;
+  const std::string file = folder.Write("empty.zip", BuildZip({}));
+
+  const Simulation run = Simulate(file, {"--trust", file});
+
+  EXPECT_EQ(run.timeline, NotAnArchive(file, "-6: Empty archive"));
+  EXPECT_EQ(run.status, 1);
+}
+
+TEST(OtherFile, WithTheAttributeButNoArchiveIsNotRegistered) {
+  const Folder folder(PlaceForAttributes());
+  const std::string file = folder.Write("notes.txt", Bytes(1000, 'x'));
+  SetAttribute(file, "1");
+
+  const Simulation run = Simulate(file, {"--trust", file});
+
+  EXPECT_EQ(run.timeline, NotAnArchive(file, "-3: Invalid file"));
+  EXPECT_EQ(run.status, 1);
+}
+
+TEST(OtherFile, ThatIsADirectoryIsRefusedByEachStep) {
+  const Folder folder;
+
+  const Simulation run = Simulate(folder.path());
+
+  EXPECT_EQ(run.timeline, NotAnArchive(folder.path(), "-3: Invalid file"));
+  EXPECT_EQ(run.status, 1);
+}
+
+}  // namespace

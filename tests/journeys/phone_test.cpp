@@ -1,0 +1,157 @@
+// The same good package on phones that are not quite healthy: what the kernel and libzu answer.
+#include <gtest/gtest.h>
+
+#include <cerrno>
+#include <cstring>
+#include <regex>
+
+#include "journeys/simulation.h"
+#include "journeys/timeline.h"
+#include "support/package.h"
+
+namespace {
+
+class GoodPackageOn : public testing::Test {
+ protected:
+  GoodPackageOn() {
+    PackageOptions options;
+    options.secure_storage = true;
+    SignPackage(options).WriteTo(apk_);
+  }
+
+  // The end of every timeline when libzu is healthy.
+  std::string RegisteredAndExit() const {
+    return Timeline({Register(3, apk_, "com.example.app", ModulusOf("rsa-2048")),
+                     Log(4, "ZuAddCertificate: ZuNewCertificate return 0.\n"), Exit(0)});
+  }
+
+  const Folder folder_;
+  const std::string apk_ = folder_ / "base.apk";
+  const std::string library_ = folder_.Write("lib/arm64/libfoo.so", ToBytes("\177ELF foo"));
+};
+
+// One refused signature: what leads up to the message (the kernel's part) differs.
+std::string Refusal(const std::string& kernels_part, int error) {
+  return Timeline({Log(4, "VeltSignOat: Apk case.\n"), kernels_part,
+                   Log(6, "VELT can't sign a file (result=10000, errno " + std::to_string(error) +
+                              ": " + strerror(error) + ").\n")});
+}
+
+// Both signatures refused; what the kernel's part is for each.
+std::string BothRefused(const std::string& library_part, const std::string& package_part,
+                        int error) {
+  return Timeline({LibraryStep({Refusal(library_part, error)}),
+                   Log(4, "VeltSign starts: zip_fd = 3, fd = 3.\n"), Refusal(package_part, error),
+                   Log(4, "VeltSign finished: 65536.\n")});
+}
+
+TEST_F(GoodPackageOn, APhoneWhoseIntegrityValueSettlesIsSignedThen) {
+  const Simulation run = Simulate(apk_, {"--integrity", "ffffffff,ffffffff,1f"});
+
+  EXPECT_EQ(run.timeline,
+            Timeline({LibraryStep({Log(4, "VeltSignOat: Apk case.\n"), Integrity("ffffffff"),
+                                   Integrity("ffffffff"), Integrity("1f"),
+                                   Sign(4, library_, PackagePayload())}),
+                      PackageStep(apk_), RegisteredAndExit()}));
+  EXPECT_EQ(run.status, 0);
+}
+
+TEST_F(GoodPackageOn, APhoneThatRevokesItsIntegrityAfterTheLibraryIsNotSignedItself) {
+  const Simulation run = Simulate(apk_, {"--integrity", "1f,missing"});
+
+  EXPECT_EQ(run.timeline, Timeline({LibraryStep({SignedLibrary(library_)}),
+                                    Log(4, "VeltSign starts: zip_fd = 3, fd = 3.\n"),
+                                    Refusal(IntegrityMissing(), ENOENT),
+                                    Log(4, "VeltSign finished: 65536.\n"), RegisteredAndExit()}));
+  EXPECT_EQ(run.status, 1);
+}
+
+TEST_F(GoodPackageOn, APhoneWithoutIntegrityFilesIsNotSigned) {
+  const Simulation run = Simulate(apk_, {"--integrity", "missing"});
+
+  EXPECT_EQ(run.timeline, Timeline({BothRefused(IntegrityMissing(), IntegrityMissing(), ENOENT),
+                                    RegisteredAndExit()}));
+  EXPECT_EQ(run.status, 1);
+}
+
+// The timeline with the values of errno blotted out, for refusals that no system call made: errno
+// is then what some earlier call left.
+std::string WithoutErrno(const std::string& timeline) {
+  return std::regex_replace(timeline, std::regex("errno [0-9]+: [^)]*"), "errno");
+}
+
+class PhoneThatMayNotSign : public GoodPackageOn,
+                            public testing::WithParamInterface<const char*> {};
+
+TEST_P(PhoneThatMayNotSign, IsNotAskedTo) {
+  const Simulation run = Simulate(apk_, {"--integrity", GetParam()});
+
+  EXPECT_EQ(WithoutErrno(run.timeline),
+            WithoutErrno(Timeline({BothRefused(Integrity(GetParam()), Integrity(GetParam()), 0),
+                                   RegisteredAndExit()})));
+  EXPECT_EQ(run.status, 1);
+}
+
+INSTANTIATE_TEST_SUITE_P(IntegrityValues, PhoneThatMayNotSign, testing::Values("0", "none", ""));
+
+TEST_F(GoodPackageOn, APhoneWhoseKernelRefusesIsNotSignedButRegistered) {
+  const Simulation run = Simulate(apk_, {"--sign-errno", "EACCES"});
+
+  EXPECT_EQ(
+      run.timeline,
+      Timeline({BothRefused(Integrity("1f") + Sign(4, library_, PackagePayload(), EACCES),
+                            Integrity("1f") + Sign(3, apk_, PackagePayload(), EACCES), EACCES),
+                RegisteredAndExit()}));
+  EXPECT_EQ(run.status, 1);
+}
+
+TEST_F(GoodPackageOn, APhoneThatTrustsNoFileIsSignedAllTheSame) {
+  const Simulation run = Simulate(apk_, {"--verify-errno", "EPERM"});
+
+  EXPECT_EQ(run.timeline, Timeline({LibraryStep({SignedLibrary(library_)}), PackageStep(apk_),
+                                    RegisteredAndExit()}));
+  EXPECT_EQ(run.status, 0);
+}
+
+class LibzuAnswer : public GoodPackageOn, public testing::WithParamInterface<int> {
+ protected:
+  // The whole timeline, up to the tool's report of the answer.
+  std::string UpToTheAnswer(int answer) const {
+    return Timeline({LibraryStep({SignedLibrary(library_)}), PackageStep(apk_),
+                     Register(3, apk_, "com.example.app", ModulusOf("rsa-2048"), answer)});
+  }
+};
+
+class LibzuSuccess : public LibzuAnswer {};
+
+TEST_P(LibzuSuccess, IsReportedAsInformation) {
+  const std::string answer = std::to_string(GetParam());
+
+  const Simulation run = Simulate(apk_, {"--zu-result", answer});
+
+  EXPECT_EQ(
+      run.timeline,
+      Timeline({UpToTheAnswer(GetParam()),
+                Log(4, "ZuAddCertificate: ZuNewCertificate return " + answer + ".\n"), Exit(0)}));
+  EXPECT_EQ(run.status, 0);
+}
+
+INSTANTIATE_TEST_SUITE_P(Answers, LibzuSuccess, testing::Values(0, 65540));
+
+class LibzuFailure : public LibzuAnswer {};
+
+TEST_P(LibzuFailure, IsReportedAsAnError) {
+  const std::string answer = std::to_string(GetParam());
+
+  const Simulation run = Simulate(apk_, {"--zu-result", answer});
+
+  EXPECT_EQ(
+      run.timeline,
+      Timeline({UpToTheAnswer(GetParam()),
+                Log(6, "ZuAddCertificate: ZuNewCertificate failed " + answer + ".\n"), Exit(0)}));
+  EXPECT_EQ(run.status, 1);
+}
+
+INSTANTIATE_TEST_SUITE_P(Answers, LibzuFailure, testing::Values(1, -1, 65536, 65539, 65541));
+
+}  // namespace

@@ -1,0 +1,267 @@
+// Packages that were changed after they were signed, or that lack a piece: what is refused, and
+// with which reasons.
+#include <gtest/gtest.h>
+
+#include <filesystem>
+
+#include "journeys/simulation.h"
+#include "journeys/timeline.h"
+#include "support/package.h"
+
+namespace {
+
+const Bytes kLibrary = ToBytes("\177ELF foo");
+
+// A package that asks for the permission, and its library on disk, for a test to spoil.
+class RefusedPackage : public testing::Test {
+ protected:
+  explicit RefusedPackage(const PackageOptions& options = Options())
+      : package_(SignPackage(options)) {}
+
+  static PackageOptions Options() {
+    PackageOptions options;
+    options.secure_storage = true;
+    return options;
+  }
+
+  Simulation Run() const {
+    package_.WriteTo(apk_);
+    return Simulate(apk_);
+  }
+
+  // The package is judged bad before anything else happens: these records, and nothing signed.
+  void ExpectRefusalAfter(std::initializer_list<std::string> reasons) const {
+    const Simulation run = Run();
+    EXPECT_EQ(run.timeline, Timeline({Timeline(reasons), NothingSigned(apk_), Exit(0)}));
+    EXPECT_EQ(run.status, 1);
+  }
+
+  // The library is refused for these reasons; the package is signed and registered all the same.
+  void ExpectLibraryRefusedAfter(std::initializer_list<std::string> reasons) const {
+    const Simulation run = Run();
+    EXPECT_EQ(run.timeline,
+              Timeline({LibraryStep({Timeline(reasons)}), PackageStep(apk_),
+                        Register(3, apk_, "com.example.app", ModulusOf("rsa-2048")),
+                        Log(4, "ZuAddCertificate: ZuNewCertificate return 0.\n"), Exit(0)}));
+    EXPECT_EQ(run.status, 1);
+  }
+
+  const Folder folder_;
+  const std::string apk_ = folder_ / "base.apk";
+  const std::string library_ = folder_.Write("lib/arm64/libfoo.so", kLibrary);
+  Package package_;
+};
+
+using TamperedPackage = RefusedPackage;
+
+TEST_F(TamperedPackage, LibraryOnDiskIsNotSigned) {
+  Bytes changed = kLibrary;
+  changed.back() ^= 1;
+  WriteFile(library_, changed);
+
+  ExpectLibraryRefusedAfter({Log(6, "VeltSignJni: File not verified: " + library_ + "\n")});
+}
+
+TEST_F(TamperedPackage, LibraryInThePackageDoesNotMatterToTheOneOnDisk) {
+  package_.Tamper("lib/arm64-v8a/libfoo.so");
+  const Simulation run = Run();
+
+  EXPECT_EQ(run.timeline,
+            Timeline({LibraryStep({SignedLibrary(library_)}), PackageStep(apk_),
+                      Register(3, apk_, "com.example.app", ModulusOf("rsa-2048")),
+                      Log(4, "ZuAddCertificate: ZuNewCertificate return 0.\n"), Exit(0)}));
+  EXPECT_EQ(run.status, 0);
+}
+
+TEST_F(TamperedPackage, ManifestIsRefused) {
+  package_.Tamper("META-INF/MANIFEST.MF");
+
+  ExpectRefusalAfter({Log(6, "Can't validate manifest.\n"), Log(6, "Can't validate manifest.\n")});
+}
+
+TEST_F(TamperedPackage, SignatureFileIsRefused) {
+  package_.Item("META-INF/CERT.SF").data[0] ^= 1;  // of "Signature-Version"
+
+  ExpectRefusalAfter({Log(6, "SHA256 hash does not match"),
+                      Log(6, "RSA could not verify data: 12\n"),
+                      Log(6, "file not verified: META-INF/CERT.SF\n")});
+}
+
+// The block ends with the signature, which becomes another number: no padding comes out of it.
+TEST_F(TamperedPackage, SignatureInTheBlockIsRefused) {
+  package_.Item("META-INF/CERT.RSA").data.back() ^= 1;
+
+  ExpectRefusalAfter(
+      {Log(6, "RSA could not verify data: 7\n"), Log(6, "file not verified: META-INF/CERT.SF\n")});
+}
+
+TEST_F(TamperedPackage, BlockThatIsCutShortIsRefused) {
+  package_.Item("META-INF/CERT.RSA").data.resize(100);
+
+  ExpectRefusalAfter({StandardOutput("CERT_PARCER [ERROR]: CANT PROCESS CERTIFICATE TAG\n"),
+                      StandardOutput("CERT_PARCER [ERROR]: processPKCS7Header() error\n"),
+                      Log(6, "Unknown certificate type"),
+                      Log(6, "file not verified: META-INF/CERT.SF\n")});
+}
+
+TEST_F(TamperedPackage, DexFileIsRefusedAndTheKeyNotRegistered) {
+  package_.Tamper("classes.dex");
+
+  const Simulation run = Run();
+
+  EXPECT_EQ(run.timeline,
+            Timeline({Log(4, "VeltSignJni starts: 3.\n"),
+                      Log(6, "Integrity not confirmed: classes.dex\n"),
+                      Log(6, "VeltSignJni: malformed apk: " + apk_ + "\n"),
+                      Log(4, "VeltSign starts: zip_fd = 3, fd = 3.\n"),
+                      Log(4, "VeltSignOat: Apk case.\n"), Log(4, "VeltSign finished: 65536.\n"),
+                      Log(6, "Apk archive is not valid for fd=3, path=" + apk_ + "\n"), Exit(0)}));
+  EXPECT_EQ(run.status, 1);
+}
+
+TEST_F(TamperedPackage, AddedDexFileThatTheManifestDoesNotNameIsRefused) {
+  package_ = SignPackage([] {
+    PackageOptions options = Options();
+    options.entries = {};
+    return options;
+  }());
+  package_.items.push_back({"classes.dex", ToBytes("dex\n035")});
+
+  const Simulation run = Run();
+
+  EXPECT_EQ(run.timeline,
+            Timeline({Log(4, "VeltSignJni starts: 3.\n"),
+                      Log(6, "Can't find file in META-INF/MANIFEST.MF: classes.dex\n"),
+                      Log(6, "Integrity not confirmed: classes.dex\n"),
+                      Log(6, "VeltSignJni: malformed apk: " + apk_ + "\n"),
+                      Log(4, "VeltSign starts: zip_fd = 3, fd = 3.\n"),
+                      Log(4, "VeltSignOat: Apk case.\n"), Log(4, "VeltSign finished: 65536.\n"),
+                      Log(6, "Apk archive is not valid for fd=3, path=" + apk_ + "\n"), Exit(0)}));
+  EXPECT_EQ(run.status, 1);
+}
+
+// Deliberate: other entries are never digested.
+TEST_F(TamperedPackage, SecondDexFileIsNotLookedAt) {
+  package_ = SignPackage([] {
+    PackageOptions options;
+    options.entries = {{"classes.dex", ToBytes("dex\n035")}, {"classes2.dex", ToBytes("dex\n035")}};
+    return options;
+  }());
+  package_.Tamper("classes2.dex");
+
+  const Simulation run = Run();
+
+  EXPECT_EQ(run.timeline, Timeline({LibraryStep(), PackageStep(apk_), Exit(0)}));
+  EXPECT_EQ(run.status, 0);
+}
+
+TEST_F(TamperedPackage, CertificateOfAnotherIssuerIsRefused) {
+  package_ = SignPackage([] {
+    PackageOptions options = Options();
+    // The issuer has the smaller modulus, so that its signature is a number below the other's.
+    options.block.key = "rsa-2048-other";
+    options.block.issuer_key = "rsa-2048";
+    return options;
+  }());
+
+  ExpectRefusalAfter({Log(6, "RSA could not verify certificate: 7\n"),
+                      Log(6, "file not verified: META-INF/CERT.SF\n")});
+}
+
+using IncompletePackage = RefusedPackage;
+
+TEST_F(IncompletePackage, WithoutItsManifestIsRefusedSilently) {
+  package_.Remove("META-INF/MANIFEST.MF");
+  ExpectRefusalAfter({});
+}
+
+TEST_F(IncompletePackage, WithoutItsSignatureFileIsRefusedSilently) {
+  package_.Remove("META-INF/CERT.SF");
+  ExpectRefusalAfter({});
+}
+
+TEST_F(IncompletePackage, WithASignatureFileInLowerCaseIsRefusedSilently) {
+  package_.Item("META-INF/CERT.SF").name = "META-INF/cert.sf";
+  ExpectRefusalAfter({});
+}
+
+TEST_F(IncompletePackage, WithoutItsSignatureBlockIsRefused) {
+  package_.Remove("META-INF/CERT.RSA");
+  ExpectRefusalAfter({Log(6, "Can't extract RSA certificate: META-INF/CERT.RSA\n")});
+}
+
+TEST_F(IncompletePackage, WithoutItsDexFileIsGood) {
+  package_.Remove("classes.dex");
+  const Simulation run = Run();
+
+  EXPECT_EQ(run.timeline,
+            Timeline({LibraryStep({SignedLibrary(library_)}), PackageStep(apk_),
+                      Register(3, apk_, "com.example.app", ModulusOf("rsa-2048")),
+                      Log(4, "ZuAddCertificate: ZuNewCertificate return 0.\n"), Exit(0)}));
+  EXPECT_EQ(run.status, 0);
+}
+
+TEST_F(IncompletePackage, LibraryThatIsNotOnDiskIsRefused) {
+  std::filesystem::remove(library_);
+  ExpectLibraryRefusedAfter({Log(6, "Can't open file: " + library_ + "\n"),
+                             Log(6, "VeltSignJni: File not verified: " + library_ + "\n")});
+}
+
+TEST_F(IncompletePackage, LibraryThatIsADirectoryOnDiskIsRefused) {
+  std::filesystem::remove(library_);
+  std::filesystem::create_directory(library_);
+  ExpectLibraryRefusedAfter({Log(6, "Can't read file: " + library_ + " (streamoff=-1)\n"),
+                             Log(6, "VeltSignJni: File not verified: " + library_ + "\n")});
+}
+
+// In a user namespace of its own the tool has no right to another user's files, not even as root.
+TEST_F(IncompletePackage, LibraryThatMayNotBeReadIsRefused) {
+  std::filesystem::permissions(library_, std::filesystem::perms::none);
+  package_.WriteTo(apk_);
+
+  const Simulation run = Simulate(apk_, {}, {{"unshare", "-U"}, {}});
+
+  EXPECT_EQ(
+      run.timeline,
+      Timeline({LibraryStep({Log(6, "Can't open file: " + library_ + "\n"),
+                             Log(6, "VeltSignJni: File not verified: " + library_ + "\n")}),
+                PackageStep(apk_), Register(3, apk_, "com.example.app", ModulusOf("rsa-2048")),
+                Log(4, "ZuAddCertificate: ZuNewCertificate return 0.\n"), Exit(0)}));
+  EXPECT_EQ(run.status, 1);
+}
+
+TEST_F(IncompletePackage, WithoutADigestOfTheLibraryTheLibraryIsRefused) {
+  package_ = SignPackage([] {
+    PackageOptions options = Options();
+    options.entries = {{"classes.dex", ToBytes("dex\n035")}};
+    return options;
+  }());
+  package_.items.push_back({"lib/arm64-v8a/libfoo.so", kLibrary});
+
+  ExpectLibraryRefusedAfter(
+      {Log(6, "Can't find file in META-INF/MANIFEST.MF: lib/arm64-v8a/libfoo.so\n"),
+       Log(6, "VeltSignJni: File not verified: " + library_ + "\n")});
+}
+
+TEST_F(IncompletePackage, OneRefusedLibraryDoesNotStopTheOther) {
+  package_ = SignPackage([] {
+    PackageOptions options;
+    options.entries = {{"lib/arm64-v8a/libfoo.so", kLibrary}, {"lib/armeabi/libbar.so", kLibrary}};
+    return options;
+  }());
+  const std::string missing = folder_ / "lib/arm/libbar.so";
+
+  const Simulation run = Run();
+
+  const std::string refused = Log(6, "Can't open file: " + missing + "\n") +
+                              Log(6, "VeltSignJni: File not verified: " + missing + "\n");
+  const std::string signed_one = SignedLibrary(library_);
+  // The zip library's order of entries is its own.
+  const bool refused_first = run.timeline.find(missing) < run.timeline.find(library_);
+  EXPECT_EQ(run.timeline, Timeline({LibraryStep({refused_first ? refused : signed_one,
+                                                 refused_first ? signed_one : refused}),
+                                    PackageStep(apk_), Exit(0)}));
+  EXPECT_EQ(run.status, 1);
+}
+
+}  // namespace
