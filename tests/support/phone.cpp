@@ -27,6 +27,11 @@ std::string NextIntegrity() {
   return text;
 }
 
+void Note(int fd, const std::string& event) {
+  phone->events.push_back(event);
+  if (phone->witness) phone->witness(fd, event);
+}
+
 int AnswerWith(int error) {
   if (error == 0) return 0;
   errno = error;
@@ -36,13 +41,12 @@ int AnswerWith(int error) {
 int Sign(int fd, const uint8_t* payload) {
   uint16_t length;
   memcpy(&length, payload, sizeof(length));
-  phone->events.push_back("sign " + std::to_string(fd) + " " +
-                          Hex(payload, sizeof(length) + length));
+  Note(fd, "sign " + std::to_string(fd) + " " + Hex(payload, sizeof(length) + length));
   return AnswerWith(phone->sign_errno);
 }
 
 int Verify(int fd) {
-  phone->events.push_back("verify " + std::to_string(fd));
+  Note(fd, "verify " + std::to_string(fd));
   return AnswerWith(phone->verify_errno);
 }
 
@@ -129,7 +133,7 @@ ssize_t __wrap_readlink(const char* path, char* buffer, size_t size) {
 
 int ZuNewCertificate(int fd, const char* name, const unsigned char* data, size_t length) {
   if (phone == nullptr) return -1;
-  phone->events.push_back("register " + std::to_string(fd) + " " + name + " " + Hex(data, length));
+  Note(fd, "register " + std::to_string(fd) + " " + name + " " + Hex(data, length));
   return phone->zu_result;
 }
 

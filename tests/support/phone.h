@@ -7,6 +7,7 @@
 
 #include <cstdint>
 #include <deque>
+#include <functional>
 #include <map>
 #include <string>
 #include <vector>
@@ -27,6 +28,9 @@ struct Phone {
   std::vector<int> nameless_fds;  // descriptors whose path cannot be resolved
   int opens_before_failure =
       -1;  // open() succeeds so many times and then finds no file; -1: always
+
+  // Called after each event that has a descriptor, while that is still open.
+  std::function<void(int fd, const std::string& event)> witness;
 
   // What the code under test did, in the order in which it did it: "integrity PATH", "sleep
   // MICROSECONDS", "sign FD PAYLOAD-HEX", "verify FD", "register FD NAME DATA-HEX".
