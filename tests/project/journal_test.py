@@ -1,0 +1,74 @@
+#!/usr/bin/env python3
+"""Holds journals of real runs against docs/journal.schema.json.
+
+Arguments: the folder of a good package that asks for its key to be registered, and the words that
+start apktoolkit-sim.
+"""
+
+import json
+import pathlib
+import subprocess
+import sys
+import tempfile
+import zipfile
+
+import jsonschema
+
+from sources import ROOT, report
+
+SCHEMA = json.loads((ROOT / "docs/journal.schema.json").read_text())
+
+
+def replace_entry(package, ending, content, out):
+    """A copy of the zip archive with other content in the entries whose names end so."""
+    with zipfile.ZipFile(package) as source, zipfile.ZipFile(out, "w") as copy:
+        for name in source.namelist():
+            copy.writestr(name, content if name.endswith(ending) else source.read(name))
+
+
+def runs(package, folder):
+    """Command lines of the simulator that between them provoke every event."""
+    folder = pathlib.Path(folder)
+    jar = folder / "library.jar"
+    with zipfile.ZipFile(jar, "w") as archive:
+        archive.writestr("a.txt", "a")
+    damaged = folder / "damaged.apk"
+    replace_entry(package, ".RSA", b"no signature block", damaged)
+    odd_name = folder / b"\xe9t\xc3\xa9.txt".decode(errors="surrogateescape")
+    odd_name.write_text("no archive")
+    yield [package]
+    yield ["--sign-errno", "EPERM", "--zu-result", "7", package]
+    yield ["--integrity", "missing", package]
+    yield ["--integrity", "ffffffff", "--timeout", "1", package]
+    yield [jar, folder / "absent.apk"]
+    yield ["--trust", jar, jar]
+    yield [damaged]
+    yield [odd_name]
+
+
+def main():
+    package = pathlib.Path(sys.argv[1]) / "base.apk"
+    validator = jsonschema.Draft202012Validator(SCHEMA)
+    problems, seen = [], {}
+    with tempfile.TemporaryDirectory() as folder:
+        for run in runs(package, folder):
+            journal = subprocess.run([*sys.argv[2:], "--json", *run], capture_output=True).stdout
+            for line in journal.splitlines():
+                event = json.loads(line)
+                problems += [f"{line}: {error.message}" for error in validator.iter_errors(event)]
+                seen[event["event"], "signal" in event] = event
+
+    kinds = {branch["properties"]["event"]["const"]
+             for branch in SCHEMA["$defs"].values() if "properties" in branch}
+    problems += [f"no run had the event {kind}" for kind in kinds - {kind for kind, _ in seen}]
+    # The schema must be able to say no: to an event without any one of its members.
+    for event in seen.values():
+        for member in event:
+            poorer = {key: value for key, value in event.items() if key != member}
+            if validator.is_valid(poorer):
+                problems.append(f"the schema takes {poorer} without {member}")
+    return report(problems)
+
+
+if __name__ == "__main__":
+    sys.exit(main())
