@@ -1,0 +1,306 @@
+// What is read from the compiled Android manifest.
+#include <gtest/gtest.h>
+
+#include "apk/apk.h"
+#include "support/compiled_manifest.h"
+#include "support/log_capture.h"
+
+using ApkTools::Apk;
+
+namespace {
+
+constexpr char kPermission[] = "com.qix.android.SECURE_STORAGE";
+constexpr char kOtherPermission[] = "com.qix.android.securestorage.permission.SECURE_STORAGE";
+
+XmlAttribute Package(const std::string& name) { return StringAttribute("package", name); }
+XmlAttribute AndroidName(const std::string& name) {
+  return InAndroidNamespace(StringAttribute("name", name));
+}
+XmlAttribute AndroidValue(const std::string& value) {
+  return InAndroidNamespace(StringAttribute("value", value));
+}
+
+// What one document yields; reading it must succeed without a message.
+struct Facts {
+  std::string package_name;
+  bool ss_permission_required;
+};
+bool operator==(const Facts& a, const Facts& b) {
+  return a.package_name == b.package_name && a.ss_permission_required == b.ss_permission_required;
+}
+std::ostream& operator<<(std::ostream& out, const Facts& facts) {
+  return out << facts.package_name << (facts.ss_permission_required ? " with" : " without");
+}
+
+Facts Read(const CompiledXml& xml) {
+  LogCapture log;
+  Apk apk(-1);
+  log.Clear();
+  EXPECT_TRUE(apk.ParseAndroidManifest(xml.Build()));
+  EXPECT_EQ(log.records(), Records());
+  return {apk.GetPackageName(), apk.IsSsPermissionRequired()};
+}
+
+// Whether an element, inside a manifest, asks for the permission.
+bool Asks(const std::string& element, const std::vector<XmlAttribute>& attributes) {
+  CompiledXml xml;
+  xml.Start("manifest", {Package("p")}).Element(element, attributes).End("manifest");
+  const Facts facts = Read(xml);
+  EXPECT_EQ(facts.package_name, "p");
+  return facts.ss_permission_required;
+}
+
+// ---- The package's name.
+
+TEST(AndroidManifestPackage, ItIsTheManifestsAttributeInEitherEncoding) {
+  for (const auto pool : {CompiledXml::Pool::kUtf8, CompiledXml::Pool::kUtf16}) {
+    EXPECT_EQ(Read(CompiledXml(pool).Element("manifest", {Package("com.example.\u00fc\u20ac")})),
+              (Facts{"com.example.\u00fc\u20ac", false}));
+  }
+}
+
+TEST(AndroidManifestPackage, ALongNameIsReadWhole) {
+  const std::string name(300, 'n');
+  for (const auto pool : {CompiledXml::Pool::kUtf8, CompiledXml::Pool::kUtf16}) {
+    EXPECT_EQ(Read(CompiledXml(pool).Element("manifest", {Package(name)})), (Facts{name, false}));
+  }
+}
+
+TEST(AndroidManifestPackage, ASecondManifestSuppliesWhatTheFirstLacks) {
+  EXPECT_EQ(Read(CompiledXml()
+                     .Element("manifest", {ReferenceAttribute("package", 0x7f010001)})
+                     .Element("manifest", {Package("second")})),
+            (Facts{"second", false}));
+}
+
+TEST(AndroidManifestPackage, AnEmptyNameLeavesRoomForASecondManifest) {
+  EXPECT_EQ(
+      Read(CompiledXml().Element("manifest", {Package("")}).Element("manifest", {Package("b")})),
+      (Facts{"b", false}));
+}
+
+TEST(AndroidManifestPackage, TheFirstManifestWithANameWins) {
+  EXPECT_EQ(
+      Read(CompiledXml().Element("manifest", {Package("a")}).Element("manifest", {Package("b")})),
+      (Facts{"a", false}));
+}
+
+TEST(AndroidManifestPackage, AManifestCountsAtAnyDepth) {
+  EXPECT_EQ(Read(CompiledXml()
+                     .Start("root")
+                     .Start("inner")
+                     .Text("text")
+                     .Element("manifest", {Package("deep")})
+                     .End("inner")
+                     .End("root")),
+            (Facts{"deep", false}));
+}
+
+TEST(AndroidManifestPackage, AReferenceIsNoName) {
+  EXPECT_EQ(Read(CompiledXml().Element("manifest", {ReferenceAttribute("package", 0x7f010001)})),
+            (Facts{"", false}));
+}
+
+TEST(AndroidManifestPackage, AnIntegerIsNoName) {
+  EXPECT_EQ(Read(CompiledXml().Element("manifest", {IntAttribute("package", 17)})),
+            (Facts{"", false}));
+}
+
+TEST(AndroidManifestPackage, OtherLetterCaseIsAnotherElementOrAttribute) {
+  EXPECT_EQ(Read(CompiledXml()
+                     .Element("Manifest", {Package("a")})
+                     .Element("manifest", {StringAttribute("Package", "b")})),
+            (Facts{"", false}));
+}
+
+TEST(AndroidManifestPackage, ADocumentWithoutManifestHasNone) {
+  EXPECT_EQ(Read(CompiledXml().Element("resources")), (Facts{"", false}));
+}
+
+TEST(AndroidManifestPackage, AnEmptyNameReplacesAnEarlierOne) {
+  LogCapture log;
+  Apk apk(-1);
+  ASSERT_TRUE(apk.ParseAndroidManifest(CompiledManifest("first")));
+  EXPECT_EQ(apk.GetPackageName(), "first");
+  ASSERT_TRUE(apk.ParseAndroidManifest(CompiledXml().Element("manifest").Build()));
+  EXPECT_EQ(apk.GetPackageName(), "");
+}
+
+TEST(AndroidManifestPackage, ANulInsideTheNameIsPartOfIt) {
+  const std::string name("com\0example", 11);
+  for (const auto pool : {CompiledXml::Pool::kUtf8, CompiledXml::Pool::kUtf16}) {
+    EXPECT_EQ(Read(CompiledXml(pool).Element("manifest", {Package(name)})), (Facts{name, false}));
+  }
+}
+
+// ---- The secure-storage permission.
+
+TEST(AndroidManifestPermission, AUsesPermissionAsksUnderEitherName) {
+  EXPECT_TRUE(Asks("uses-permission", {AndroidName(kPermission)}));
+  EXPECT_TRUE(Asks("uses-permission", {AndroidName(kOtherPermission)}));
+  EXPECT_FALSE(Asks("uses-permission", {AndroidName("android.permission.INTERNET")}));
+}
+
+TEST(AndroidManifestPermission, ALonePermissionElementAsks) {
+  EXPECT_TRUE(Asks("permission", {AndroidName(kPermission)}));
+  EXPECT_TRUE(Asks("permission", {AndroidName(kOtherPermission)}));
+  EXPECT_FALSE(Asks("permission", {AndroidName("com.example.OWN")}));
+}
+
+TEST(AndroidManifestPermission, OtherElementsDoNotAsk) {
+  EXPECT_FALSE(Asks("uses-permission-sdk-23", {AndroidName(kPermission)}));
+  EXPECT_FALSE(Asks("Permission", {AndroidName(kPermission)}));
+  EXPECT_FALSE(Asks("service", {AndroidName(kPermission)}));
+}
+
+TEST(AndroidManifestPermission, NamesAreCaseSensitiveAndWhole) {
+  EXPECT_FALSE(Asks("uses-permission", {AndroidName("com.qix.android.Secure_Storage")}));
+  EXPECT_FALSE(Asks("uses-permission", {AndroidName("com.qix.android.SECURE_STORAGE2")}));
+  EXPECT_FALSE(Asks("uses-permission", {AndroidName("com.qix.android.SECURE_STORAG")}));
+}
+
+TEST(AndroidManifestPermission, ANulDoesNotEndAName) {
+  EXPECT_FALSE(
+      Asks("uses-permission", {AndroidName(std::string(kPermission) + std::string("\0x", 2))}));
+  EXPECT_FALSE(Asks("uses-permission", {AndroidName(std::string(kPermission) + '\0')}));
+  EXPECT_FALSE(Asks(std::string("uses-permission\0", 16), {AndroidName(kPermission)}));
+  EXPECT_FALSE(Asks("uses-permission", {StringAttribute(std::string("name\0", 5), kPermission)}));
+}
+
+TEST(AndroidManifestPermission, MetaDataAsksWithAccessAndItsValue) {
+  EXPECT_TRUE(Asks("meta-data", {AndroidName("access"), AndroidValue("SS_META")}));
+  EXPECT_TRUE(Asks("meta-data", {AndroidValue("SS_META"), AndroidName("access")}));
+}
+
+TEST(AndroidManifestPermission, MetaDataInAnotherLetterCaseDoesNotAsk) {
+  EXPECT_FALSE(Asks("meta-data", {AndroidName("Access"), AndroidValue("SS_META")}));
+  EXPECT_FALSE(Asks("meta-data", {AndroidName("access"), AndroidValue("ss_meta")}));
+  EXPECT_FALSE(Asks("Meta-Data", {AndroidName("access"), AndroidValue("SS_META")}));
+}
+
+TEST(AndroidManifestPermission, MetaDataNeedsBothAttributes) {
+  EXPECT_FALSE(Asks("meta-data", {AndroidName("access")}));
+  EXPECT_FALSE(Asks("meta-data", {AndroidValue("SS_META")}));
+  EXPECT_FALSE(Asks("meta-data", {AndroidName("access"), IntAttribute("value", 1)}));
+}
+
+TEST(AndroidManifestPermission, MetaDataWithAPermissionsNameDoesNotAsk) {
+  EXPECT_FALSE(Asks("meta-data", {AndroidName(kPermission)}));
+}
+
+TEST(AndroidManifestPermission, ItStaysSetOnceItIsSet) {
+  EXPECT_EQ(Read(CompiledXml()
+                     .Element("uses-permission", {AndroidName(kPermission)})
+                     .Element("uses-permission", {AndroidName("android.permission.INTERNET")})
+                     .Element("meta-data", {AndroidName("other")})
+                     .Element("manifest", {Package("p")})),
+            (Facts{"p", true}));
+}
+
+// ---- Which attribute is read.
+
+TEST(AndroidManifestAttribute, NamesMatchInAnyNamespace) {
+  EXPECT_TRUE(Asks("uses-permission", {StringAttribute("name", kPermission)}));
+  XmlAttribute other = StringAttribute("name", kPermission);
+  other.name_space = "http://example.com/other";
+  EXPECT_TRUE(Asks("uses-permission", {other}));
+}
+
+TEST(AndroidManifestAttribute, TheFirstStringOfTheNameIsTaken) {
+  EXPECT_EQ(Read(CompiledXml().Element("manifest", {Package("a"), Package("b")})),
+            (Facts{"a", false}));
+}
+
+TEST(AndroidManifestAttribute, AReferenceIsPassedOverForALaterString) {
+  EXPECT_EQ(Read(CompiledXml().Element("manifest",
+                                       {ReferenceAttribute("package", 0x7f010001), Package("b")})),
+            (Facts{"b", false}));
+}
+
+TEST(AndroidManifestAttribute, AStringWithoutTextIsPassedOverForALaterString) {
+  EXPECT_EQ(Read(CompiledXml().Element("manifest",
+                                       {StringAttributeWithoutText("package"), Package("b")})),
+            (Facts{"b", false}));
+}
+
+TEST(AndroidManifestAttribute, ALoneStringWithoutTextIsMissing) {
+  EXPECT_EQ(Read(CompiledXml().Element("manifest", {StringAttributeWithoutText("package")})),
+            (Facts{"", false}));
+}
+
+// ---- Documents that are not as they should be.
+
+TEST(AndroidManifestDocument, BytesThatAreNotCompiledXmlFail) {
+  LogCapture log;
+  Apk apk(-1);
+  ASSERT_TRUE(apk.ParseAndroidManifest(CompiledManifest("before", true)));
+  log.Clear();
+  EXPECT_FALSE(apk.ParseAndroidManifest(ToBytes("<?xml version='1.0'?><manifest/>")));
+  // 0x80000001: BAD_TYPE of the platform's status codes.
+  EXPECT_EQ(log.records(), Records({Error("ParseAndroidManifest failed to init xml parser, "
+                                          "error=0x80000001\n")}));
+  EXPECT_EQ(apk.GetPackageName(), "before");
+  EXPECT_TRUE(apk.IsSsPermissionRequired());
+}
+
+TEST(AndroidManifestDocument, NoBytesAtAllFail) {
+  LogCapture log;
+  Apk apk(-1);
+  log.Clear();
+  EXPECT_FALSE(apk.ParseAndroidManifest({}));
+  EXPECT_EQ(log.records(), Records({Error("ParseAndroidManifest failed to init xml parser, "
+                                          "error=0x80000001\n")}));
+}
+
+TEST(AndroidManifestDocument, OneThatTurnsBadAfterTheManifestTagKeepsWhatWasFound) {
+  EXPECT_EQ(Read(CompiledXml()
+                     .Start("manifest", {Package("found")})
+                     .BadNode()
+                     .Element("uses-permission", {AndroidName(kPermission)})),
+            (Facts{"found", false}));
+}
+
+TEST(AndroidManifestDocument, OneThatTurnsBadAfterThePermissionKeepsIt) {
+  EXPECT_EQ(Read(CompiledXml()
+                     .Element("uses-permission", {AndroidName(kPermission)})
+                     .BadNode()
+                     .Element("manifest", {Package("lost")})),
+            (Facts{"", true}));
+}
+
+// The document's first `length` bytes, with the outer length made to fit.
+Bytes CutTo(size_t length, const Bytes& document) {
+  Bytes cut(document.begin(), document.begin() + static_cast<ptrdiff_t>(length));
+  for (size_t i = 4; i < 8 && i < length; ++i) {
+    cut[i] = static_cast<uint8_t>(length >> (8 * (i - 4)));
+  }
+  cut.shrink_to_fit();
+  return cut;
+}
+
+TEST(AndroidManifestDocument, OneThatIsCutShortAnywhereIsReadOrRefusedWithoutHarm) {
+  const Bytes whole = CompiledManifest("com.example.app", true);
+  LogCapture log;
+  size_t read = 0;
+  for (size_t length = 0; length < whole.size(); ++length) {
+    Apk apk(-1);
+    log.Clear();
+    const bool good = apk.ParseAndroidManifest(CutTo(length, whole));
+    EXPECT_EQ(good, log.records().empty());
+    if (good) ++read;
+  }
+  EXPECT_GT(read, 0u);
+  EXPECT_LT(read, whole.size());
+}
+
+TEST(AndroidManifestDocument, AnElementWithoutNameIsPassedOver) {
+  EXPECT_EQ(Read(CompiledXml().StartWithoutName().Element("manifest", {Package("p")})),
+            (Facts{"p", false}));
+}
+
+TEST(AndroidManifestDocument, ANamespaceWithoutUriIsPassedOver) {
+  EXPECT_EQ(Read(CompiledXml().StartNamespaceWithoutUri().Element("manifest", {Package("p")})),
+            (Facts{"p", false}));
+}
+
+}  // namespace

@@ -1,0 +1,350 @@
+// Single entries and files against the digests that the manifest records.
+#include <gtest/gtest.h>
+#include <unistd.h>
+
+#include <algorithm>
+
+#include "apk/open_package.h"
+#include "apk/zip_library.h"
+#include "support/jar.h"
+#include "support/log_capture.h"
+
+using ApkTools::Apk;
+
+namespace {
+
+constexpr char kDexFailed[] = "Integrity not confirmed: classes.dex\n";
+
+PackageOptions WithDigests(const std::vector<std::string>& digests) {
+  PackageOptions options;
+  options.digests = digests;
+  return options;
+}
+
+// The good package whose manifest is this text.
+PackageOptions WithManifest(const std::string& text) {
+  PackageOptions options;
+  options.edit_manifest = [=](const std::string&) { return text; };
+  return options;
+}
+
+// ---- The package's verdict.
+
+TEST(IsGoodApk, TheDexThatTheManifestListsIsGood) {
+  LogCapture log;
+  OpenPackage open{PackageOptions()};
+  EXPECT_TRUE(open.apk.IsGoodApk());
+  EXPECT_TRUE(open.apk.IsGoodApk());
+  EXPECT_EQ(log.records(), Records());
+}
+
+TEST(IsGoodApk, APackageWithoutDexIsGood) {
+  PackageOptions options;
+  options.entries.clear();
+  LogCapture log;
+  OpenPackage open(options);
+  EXPECT_TRUE(open.apk.IsGoodApk());
+  EXPECT_EQ(log.records(), Records());
+}
+
+TEST(IsGoodApk, ADexThatTheManifestDoesNotListIsReportedOnce) {
+  LogCapture log;
+  OpenPackage open(WithManifest(""));
+  EXPECT_EQ(log.records(), Records());
+  EXPECT_FALSE(open.apk.IsGoodApk());
+  EXPECT_EQ(log.records(), Records({Error("Can't find file in META-INF/MANIFEST.MF: classes.dex\n"),
+                                    Error(kDexFailed)}));
+  log.Clear();
+  EXPECT_FALSE(open.apk.IsGoodApk());
+  EXPECT_FALSE(open.apk.IsGoodApk());
+  EXPECT_EQ(log.records(), Records());
+}
+
+TEST(IsGoodApk, ATamperedDexIsBadAndStaysBad) {
+  Package package = SignPackage();
+  package.Tamper("classes.dex");
+  LogCapture log;
+  OpenPackage open(package);
+  EXPECT_FALSE(open.apk.IsGoodApk());
+  EXPECT_EQ(log.records(), Records({Error(kDexFailed)}));
+  EXPECT_FALSE(open.apk.IsGoodApk());
+  EXPECT_EQ(log.records(), Records({Error(kDexFailed)}));
+}
+
+TEST(IsGoodApk, OtherEntriesAreNotExamined) {
+  Package package = SignPackage();
+  package.Tamper("lib/arm64-v8a/libfoo.so");
+  OpenPackage open(package);
+  EXPECT_TRUE(open.apk.IsGoodApk());
+}
+
+// Changes the data of "classes.dex" in the file under an open package.
+void ChangeDex(OpenPackage& open, const Bytes& archive) {
+  const Bytes dex = ToBytes("dex\n035");
+  const auto found = std::search(archive.begin(), archive.end(), dex.begin(), dex.end());
+  ASSERT_NE(found, archive.end());
+  ASSERT_EQ(pwrite(open.file.fd(), "X", 1, found - archive.begin()), 1);
+}
+
+TEST(IsGoodApk, AfterOneSuccessTheArchiveIsNotReadAgain) {
+  const Bytes archive = SignPackage().Build();
+  OpenPackage open(archive);
+  EXPECT_TRUE(open.apk.IsGoodApk());
+  ChangeDex(open, archive);
+  EXPECT_TRUE(open.apk.IsGoodApk());
+}
+
+TEST(IsGoodApk, TheArchiveIsReadWhenItIsFirstAsked) {
+  const Bytes archive = SignPackage().Build();
+  LogCapture log;
+  OpenPackage open(archive);
+  ChangeDex(open, archive);
+  EXPECT_FALSE(open.apk.IsGoodApk());
+}
+
+TEST(IsGoodApk, APackageThatInitJudgedBadIsNotExamined) {
+  Package package = SignPackage();
+  package.Remove(kManifestName);
+  LogCapture log;
+  OpenPackage open(package);
+  EXPECT_FALSE(open.apk.IsGoodApk());
+  EXPECT_EQ(log.records(), Records());
+}
+
+TEST(IsGoodApk, ADexThatIsThereButCannotBeFoundIsBad) {
+  Package package = SignPackage();
+  package.Item("classes.dex").local_name = "Classes.dex";  // the two headers disagree
+  LogCapture log;
+  OpenPackage open(package);
+  EXPECT_FALSE(open.apk.IsGoodApk());
+  EXPECT_EQ(log.records(), Records({Error(kDexFailed)}));
+}
+
+TEST(IsGoodApk, ADexOfAnImpossibleLengthIsBad) {
+  Package package = SignPackage();
+  ZipItem& dex = package.Item("classes.dex");
+  dex.deflated = true;
+  dex = ClaimingLength(dex, 0xfffffffe);
+  LogCapture log;
+  OpenPackage open(package);
+  EXPECT_FALSE(open.apk.IsGoodApk());
+  EXPECT_EQ(log.records(), Records({Error(kDexFailed)}));
+}
+
+TEST(IsGoodApk, OtherDexFilesAreNotExamined) {
+  PackageOptions options;
+  options.entries.push_back({"classes2.dex", ToBytes("dex\n035 2")});
+  Package package = SignPackage(options);
+  package.Tamper("classes2.dex");
+  OpenPackage open(package);
+  EXPECT_TRUE(open.apk.IsGoodApk());
+}
+
+// ---- One entry.
+
+// VerifyEntryHash on the entry that the archive has under this name.
+bool VerifyEntry(OpenPackage& open, const std::string& name) {
+  void* cookie;
+  EXPECT_EQ(open.apk.StartIteration(&cookie, name, name), 0);
+  ZipEntry entry;
+  std::string found;
+  EXPECT_EQ(open.apk.Next(cookie, &entry, found), 0);
+  open.apk.EndIteration(cookie);
+  EXPECT_EQ(found, name);
+  return open.apk.VerifyEntryHash(name, entry);
+}
+
+TEST(VerifyEntryHash, AnEntryListedWithSha256AloneIsVerifiedWithIt) {
+  OpenPackage open(WithDigests({"SHA-256-Digest"}));
+  EXPECT_TRUE(VerifyEntry(open, "classes.dex"));
+}
+
+TEST(VerifyEntryHash, AnEntryListedWithSha1AloneIsVerifiedWithIt) {
+  OpenPackage open(WithDigests({"SHA1-Digest"}));
+  EXPECT_TRUE(VerifyEntry(open, "classes.dex"));
+}
+
+// "classes.dex" listed with the digests of these contents.
+PackageOptions WithDexDigests(const std::string& sha1_of, const std::string& sha256_of) {
+  return WithManifest(JarText::Manifest()
+                          .EndSection()
+                          .Attribute("Name", "classes.dex")
+                          .Digests({"SHA1-Digest"}, ToBytes(sha1_of))
+                          .Digests({"SHA-256-Digest"}, ToBytes(sha256_of))
+                          .EndSection()
+                          .text());
+}
+
+TEST(VerifyEntryHash, AnEntryListedWithBothIsVerifiedWithSha1) {
+  OpenPackage open(WithDexDigests("dex\n035", "other"));
+  EXPECT_TRUE(VerifyEntry(open, "classes.dex"));
+}
+
+TEST(VerifyEntryHash, AnEntryListedWithBothIsNotVerifiedWithSha256) {
+  OpenPackage open(WithDexDigests("other", "dex\n035"));
+  EXPECT_FALSE(VerifyEntry(open, "classes.dex"));
+}
+
+TEST(VerifyEntryHash, AMismatchIsNotReported) {
+  Package package = SignPackage();
+  package.Tamper("classes.dex");
+  LogCapture log;
+  OpenPackage open(package);
+  EXPECT_FALSE(VerifyEntry(open, "classes.dex"));
+  EXPECT_EQ(log.records(), Records());
+}
+
+TEST(VerifyEntryHash, AnEntryListedWithMd5AloneIsUnsupported) {
+  LogCapture log;
+  OpenPackage open(WithDigests({"MD5-Digest"}));
+  EXPECT_FALSE(VerifyEntry(open, "classes.dex"));
+  EXPECT_EQ(log.records(), Records({Error("verifyData: Unsupported digest type: MD5-Digest\n")}));
+}
+
+TEST(VerifyEntryHash, AnUndecodableDigestNeverMatches) {
+  LogCapture log;
+  OpenPackage open(WithManifest(JarText::Manifest()
+                                    .EndSection()
+                                    .Attribute("Name", "classes.dex")
+                                    .Attribute("SHA1-Digest", "not base64!")
+                                    .EndSection()
+                                    .text()));
+  EXPECT_FALSE(VerifyEntry(open, "classes.dex"));
+  EXPECT_EQ(log.records(), Records());
+}
+
+TEST(VerifyEntryHash, AnEntryThatCannotBeExtractedIsNotReported) {
+  Package package = SignPackage();
+  ZipItem& dex = package.Item("classes.dex");
+  dex = ClaimingLength(dex, 3);
+  LogCapture log;
+  OpenPackage open(package);
+  EXPECT_FALSE(VerifyEntry(open, "classes.dex"));
+  EXPECT_EQ(log.records(), Records());
+}
+
+TEST(VerifyEntryHash, AnEntryThatTheManifestDoesNotListIsReported) {
+  Package package = SignPackage();
+  package.items.push_back({"added.so", ToBytes("added")});
+  LogCapture log;
+  OpenPackage open(package);
+  EXPECT_FALSE(VerifyEntry(open, "added.so"));
+  EXPECT_EQ(log.records(), Records({Error("Can't find file in META-INF/MANIFEST.MF: added.so\n")}));
+}
+
+TEST(VerifyEntryHash, TheSignaturesOwnFilesNeedNoDigest) {
+  LogCapture log;
+  OpenPackage open{PackageOptions()};
+  EXPECT_TRUE(VerifyEntry(open, "META-INF/CERT.SF"));
+  EXPECT_EQ(log.records(), Records());
+}
+
+TEST(VerifyEntryHash, AnEmptyEntryIsVerified) {
+  PackageOptions options;
+  options.entries = {{"empty", {}}, {"deflated", {}, true}};
+  OpenPackage open(options);
+  EXPECT_TRUE(VerifyEntry(open, "empty"));
+  EXPECT_TRUE(VerifyEntry(open, "deflated"));
+}
+
+// ---- One file.
+
+class DiskFile {
+ public:
+  explicit DiskFile(const std::string& text) : path_(testing::TempDir() + "entry_test.so") {
+    WriteFile(path_, ToBytes(text));
+  }
+  ~DiskFile() { unlink(path_.c_str()); }
+  const std::string& path() const { return path_; }
+
+ private:
+  std::string path_;
+};
+
+constexpr char kLibrary[] = "lib/arm64-v8a/libfoo.so";
+
+TEST(VerifyFileHash, TheNameSelectsTheDigestAndThePathSuppliesTheBytes) {
+  OpenPackage open{PackageOptions()};
+  DiskFile library("\177ELF foo");
+  EXPECT_TRUE(open.apk.VerifyFileHash(kLibrary, library.path()));
+  EXPECT_FALSE(open.apk.VerifyFileHash("classes.dex", library.path()));
+}
+
+TEST(VerifyFileHash, AMismatchIsNotReported) {
+  OpenPackage open{PackageOptions()};
+  DiskFile library("\177ELF fop");
+  LogCapture log;
+  EXPECT_FALSE(open.apk.VerifyFileHash(kLibrary, library.path()));
+  EXPECT_EQ(log.records(), Records());
+}
+
+TEST(VerifyFileHash, AFileThatCannotBeReadIsReported) {
+  OpenPackage open{PackageOptions()};
+  LogCapture log;
+  EXPECT_FALSE(open.apk.VerifyFileHash(kLibrary, "/nowhere/libfoo.so"));
+  EXPECT_EQ(log.records(), Records({Error("Can't open file: /nowhere/libfoo.so\n")}));
+}
+
+TEST(VerifyFileHash, AFileListedWithMd5AloneIsUnsupported) {
+  OpenPackage open(WithDigests({"MD5-Digest"}));
+  DiskFile library("\177ELF foo");
+  LogCapture log;
+  EXPECT_FALSE(open.apk.VerifyFileHash(kLibrary, library.path()));
+  EXPECT_EQ(log.records(), Records({Error("verifyData: Unsupported digest type: MD5-Digest\n")}));
+}
+
+TEST(VerifyFileHash, ASignatureFileIsGoodWithoutBeingRead) {
+  OpenPackage open{PackageOptions()};
+  LogCapture log;
+  EXPECT_TRUE(open.apk.VerifyFileHash("META-INF/CERT.SF", "/nowhere"));
+  EXPECT_EQ(log.records(), Records());
+}
+
+TEST(VerifyFileHash, ASignatureFileThatIsListedIsReadAfterAll) {
+  OpenPackage open(
+      WithManifest(JarText().Section("META-INF/CERT.SF", {"SHA1-Digest"}, ToBytes("x")).text()));
+  LogCapture log;
+  EXPECT_FALSE(open.apk.VerifyFileHash("META-INF/CERT.SF", "/nowhere"));
+  EXPECT_EQ(log.records(), Records({Error("Can't open file: /nowhere\n")}));
+}
+
+TEST(VerifyFileHash, ASignatureFileInLowerCaseIsAFileLikeOthers) {
+  OpenPackage open{PackageOptions()};
+  LogCapture log;
+  EXPECT_FALSE(open.apk.VerifyFileHash("META-INF/cert.sf", "/nowhere"));
+  EXPECT_EQ(log.records(),
+            Records({Error("Can't find file in META-INF/MANIFEST.MF: META-INF/cert.sf\n")}));
+}
+
+TEST(VerifyFileHash, AFailedCheckLeavesTheRecordedDigestsAlone) {
+  LogCapture log;
+  OpenPackage open{PackageOptions()};
+  EXPECT_FALSE(open.apk.VerifyFileHash(kLibrary, "/nowhere"));
+  EXPECT_FALSE(open.apk.VerifyFileHash("added.so", "/nowhere"));
+  DiskFile library("\177ELF foo");
+  EXPECT_TRUE(open.apk.VerifyFileHash(kLibrary, library.path()));
+}
+
+// ---- The names that need no digest.
+
+TEST(CanSkipValidation, TheSevenNamesCan) {
+  LogCapture log;
+  Apk apk(-1);
+  for (const char* name :
+       {"META-INF/CERT.RSA", "META-INF/ANDROIDD.RSA", "META-INF/SECUREST.RSA", "META-INF/CERT.SF",
+        "META-INF/ANDROIDD.SF", "META-INF/SECUREST.SF", "META-INF/MANIFEST.MF"}) {
+    EXPECT_TRUE(apk.CanSkipValidation(name)) << name;
+  }
+}
+
+TEST(CanSkipValidation, NoOtherNameCan) {
+  LogCapture log;
+  Apk apk(-1);
+  for (const char* name : {"", "META-INF/", "META-INF/cert.rsa", "META-INF/CERT.DSA", "CERT.RSA",
+                           "META-INF/CERT.RSA ", "META-INF/KEY.SF", "classes.dex"}) {
+    EXPECT_FALSE(apk.CanSkipValidation(name)) << name;
+  }
+  EXPECT_FALSE(apk.CanSkipValidation(std::string("META-INF/CERT.SF\0", 17)));
+}
+
+}  // namespace
