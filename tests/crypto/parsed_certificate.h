@@ -1,0 +1,49 @@
+// A certificate with what x509_certificate_parse makes of it, for the tests of the parser.
+#pragma once
+
+#include <string>
+#include <utility>
+
+#include "crypto/x509.h"
+#include "support/certificate.h"
+
+// The signature does not matter to the parser: made up, it costs nothing.
+inline Certificate Unsigned() {
+  Certificate certificate;
+  certificate.signature = der::BitString(Bytes(8, 0x5a));
+  return certificate;
+}
+
+// Parsed from a heap buffer of exactly the certificate's size, so that reading past it is caught.
+struct ParsedCertificate {
+  explicit ParsedCertificate(Bytes der) : bytes(std::move(der)) {
+    bytes.shrink_to_fit();
+    result = x509_certificate_parse(bytes.data(), bytes.size(), &cert);
+  }
+  explicit ParsedCertificate(const Certificate& certificate)
+      : ParsedCertificate(certificate.Build()) {}
+  ParsedCertificate(const ParsedCertificate&) = delete;
+  ParsedCertificate& operator=(const ParsedCertificate&) = delete;
+
+  Bytes bytes;
+  int result;
+  x509_certificate cert;
+};
+
+inline int ResultOf(const Certificate& certificate) {
+  return ParsedCertificate(certificate).result;
+}
+
+inline int ResultOf(const Bytes& der) { return ParsedCertificate(der).result; }
+
+// A field of the record, as bytes and as text.
+inline Bytes Field(const uint8_t* value, uint64_t length) { return Bytes(value, value + length); }
+inline std::string TextField(const uint8_t* value, uint64_t length) {
+  return std::string(value, value + length);
+}
+
+inline std::string DottedText(const asn1_oid& oid) {
+  char text[80];
+  asn1_oid_to_str(&oid, text, sizeof(text));
+  return text;
+}
