@@ -53,7 +53,7 @@ install_libraries() {
   local directory work
   directory=$(dirname "$1") work=$(mktemp -d)
   unzip -q "$1" 'lib/*' -d "$work"
-  rm -rf "$directory/lib"
+  rm -rf "${directory:?}/lib"
   mkdir "$directory/lib"
   mv "$work/lib/arm64-v8a" "$directory/lib/arm64"
   mv "$work/lib/armeabi-v7a" "$directory/lib/arm"
