@@ -162,6 +162,30 @@ void MakeCompiledManifests() {
   Seed("compiled_manifest", "bad-node", CompiledXml().Start("manifest").BadNode().Build());
 }
 
+// The first byte says what the phone is like: 0 is a healthy one, 2 gives the file "user.zu".
+void SeedPackage(const std::string& name, const PackageOptions& options, uint8_t phone = 0) {
+  Seed("package", name, Concat({{phone}, SignPackage(options).Build()}));
+}
+
+void MakePackages() {
+  PackageOptions options;
+  options.block = SmallBlock();
+  SeedPackage("good", options);
+  options.secure_storage = true;
+  options.digests = options.signature_file_digests = {"SHA1-Digest", "SHA-256-Digest"};
+  SeedPackage("registered", options);
+  const Bytes library = ToBytes("\177ELF foo");
+  options.entries = {{"lib/armeabi-v7a/libfoo.so", library},
+                     {"lib/armeabi/libbar.so", ToBytes("\177ELF bar")},
+                     {"lib/arm64-v8a/../../../outside.so", library},
+                     {"lib/x86/libfoo.so", library},
+                     {"res/raw", Bytes(300, 'x'), true}};
+  SeedPackage("libraries", options, 16);
+  options.android_manifest = Bytes();
+  SeedPackage("jar", options);
+  SeedPackage("registered-jar", options, 2);
+}
+
 }  // namespace
 
 int main(int argc, char* argv[]) {
@@ -176,5 +200,6 @@ int main(int argc, char* argv[]) {
   MakeNumbers();
   MakeTexts();
   MakeCompiledManifests();
+  MakePackages();
   return 0;
 }

@@ -1,0 +1,221 @@
+// The whole tool, from main() on, over any bytes as the package file, on a phone in the program.
+// The first byte of the input says what the phone is like. Whatever is signed or registered is
+// judged by a second reading of the same bytes; memory and descriptors are counted.
+#include <dirent.h>
+#include <fcntl.h>
+#include <sanitizer/allocator_interface.h>
+#include <sys/stat.h>
+#include <unistd.h>
+#include <ziparchive/zip_archive.h>
+
+#include <atomic>
+#include <filesystem>
+#include <fstream>
+#include <memory>
+#include <optional>
+#include <sstream>
+#include <vector>
+
+#include "fuzz/fuzz.h"
+#include "fuzz/package_model.h"
+#include "fuzz/package_mutator.h"
+#include "support/certificate.h"
+#include "support/package.h"
+#include "support/phone.h"
+
+// sign/main.cpp, which this program is built with under that name.
+int ToolMain(int argc, char* argv[]);
+
+namespace {
+
+// A run may hold, at its worst moment, this many bytes for each byte of the archive and of what its
+// entries declare, and as much besides for what does not depend on either.
+constexpr size_t kBytesPerByte = 64;
+constexpr size_t kBytesBesides = 1 << 20;
+
+std::vector<ZipArchiveHandle> open_archives;
+
+// The directory of the package, in memory, with the libraries that an installer put there.
+class Installation {
+ public:
+  Installation() {
+    char root[] = "/dev/shm/apktoolkit-fuzz.XXXXXX";
+    Require(mkdtemp(root) != nullptr, "a directory in memory");
+    root_ = root;
+    directory_ = root_ + "/app/";
+    for (const char* const abi : {"arm", "arm64"}) {
+      const std::string libraries = directory_ + "lib/" + abi + "/";
+      std::filesystem::create_directories(libraries);
+      WriteFile(libraries + "libfoo.so", ToBytes("\177ELF foo"));
+      WriteFile(libraries + "libbar.so", ToBytes("\177ELF bar"));
+    }
+    WriteFile(root_ + "/outside.so", ToBytes("\177ELF foo"));
+  }
+  ~Installation() { std::filesystem::remove_all(root_); }
+  Installation(const Installation&) = delete;
+  Installation& operator=(const Installation&) = delete;
+
+  const std::string& directory() const { return directory_; }
+  std::string package() const { return directory_ + "base.apk"; }
+
+ private:
+  std::string root_, directory_;
+};
+
+const Installation& TheInstallation() {
+  static const Installation installation;
+  return installation;
+}
+
+// Bytes that the process holds, and the most that it held, while a run is measured.
+std::atomic<bool> is_measured;
+std::atomic<size_t> held, most_held;
+
+void Allocated(const volatile void*, size_t size) {
+  if (!is_measured) return;
+  held += size;
+  if (held > most_held) most_held = held.load();
+}
+
+void Freed(const volatile void* block) {
+  if (!is_measured || block == nullptr) return;
+  const size_t size = __sanitizer_get_allocated_size(block);
+  held -= std::min(size, held.load());
+}
+
+void Install() {
+  static const bool installed = __sanitizer_install_malloc_and_free_hooks(Allocated, Freed) != 0;
+  Require(installed, "the memory is watched");
+}
+
+size_t LowestFreeDescriptor() {
+  const int fd = dup(STDERR_FILENO);
+  close(fd);
+  return static_cast<size_t>(fd);
+}
+
+std::string PathOf(int fd) {
+  return std::filesystem::read_symlink("/proc/self/fd/" + std::to_string(fd)).string();
+}
+
+// Judges what the phone was asked for.
+class Judge {
+ public:
+  Judge(const Bytes& archive, const Phone& phone) : archive_(archive), phone_(phone) {}
+
+  void Witness(int fd, const std::string& event) {
+    is_measured = false;
+    if (!model_) model_.emplace(archive_);
+    std::istringstream words(event);
+    std::string what, number, last;
+    words >> what >> number;
+    while (words >> last) {
+    }
+    const bool is_package_file = PathOf(fd) == TheInstallation().package();
+    if (what == "verify") Require(is_package_file, "the kernel is asked about the file itself");
+    if (what == "sign") JudgeSigning(fd, last, is_package_file);
+    if (what == "register") JudgeRegistration(last, is_package_file);
+    is_measured = true;
+  }
+
+ private:
+  void JudgeSigning(int fd, const std::string& payload, bool is_package_file) {
+    if (payload == "0000") {
+      Require(!model_->is_package(), "the empty payload is for what is no package");
+      Require(is_package_file && phone_.verify_errno == 0, "and only for a file trusted already");
+      return;
+    }
+    Require(payload == "2000" + Hex(DigestOf(Digest::kSha256, model_->key())),
+            "a payload is the digest of the signer's key");
+    Require(model_->is_good(), "nothing is signed for a package that is not good");
+    if (is_package_file) return;
+    const Bytes content = ContentOf(fd);
+    Require(model_->AllowsLibrary(TheInstallation().directory(), PathOf(fd), content),
+            "a library is signed when its bytes are those of the manifest");
+  }
+
+  void JudgeRegistration(const std::string& data, bool is_package_file) {
+    Require(is_package_file, "a registration is for the file itself");
+    if (model_->is_package()) {
+      Require(model_->is_good(), "nothing is registered for a package that is not good");
+      Require(data == Hex(model_->key()), "a package registers its signer's key");
+    } else {
+      Require(phone_.zu_attribute_size > 0, "a JAR is registered when it asks for it");
+      Require(data.size() == 256, "with a block of 128 bytes");
+    }
+  }
+
+  static Bytes ContentOf(int fd) {
+    Bytes content(1 << 16);
+    const ssize_t size = pread(fd, content.data(), content.size(), 0);
+    Require(size >= 0, "a signed file can be read");
+    content.resize(static_cast<size_t>(size));
+    return content;
+  }
+
+  const Bytes& archive_;
+  const Phone& phone_;
+  std::optional<PackageModel> model_;
+};
+
+void SetUp(Phone& phone, uint8_t choices) {
+  if ((choices & 1) != 0) phone.verify_errno = ENOKEY;
+  if ((choices & 2) != 0) phone.zu_attribute_size = 1;
+  if ((choices & 4) != 0) phone.sign_errno = EPERM;
+  if ((choices & 8) != 0) phone.integrity = {"ffffffff\n", "0\n"};
+  if ((choices & 16) != 0) phone.integrity = {"ffffffff\n", "1f\n"};
+  if ((choices & 32) != 0) phone.zu_result = 0x10004;
+  if ((choices & 64) != 0) phone.has_integrity_file = false;
+}
+
+void RunTool(const std::string& path) {
+  std::string name = "apktoolkit", argument = path;
+  char* arguments[] = {name.data(), argument.data(), nullptr};
+  const size_t descriptors = LowestFreeDescriptor();
+  held = most_held = 0;
+  is_measured = true;
+  const int status = ToolMain(2, arguments);
+  is_measured = false;
+  Require(status == 0, "the exit status is 0");
+  Require(LowestFreeDescriptor() == descriptors, "no descriptor is left open");
+}
+
+}  // namespace
+
+// The tool never closes its archive, for the process ends. Here it goes on, so the archives are
+// kept and closed after each run.
+extern "C" {
+int32_t __real__Z13OpenArchiveFdiPKcPP10ZipArchiveb(int, const char*, ZipArchiveHandle*, bool);
+int32_t __wrap__Z13OpenArchiveFdiPKcPP10ZipArchiveb(int fd, const char* name,
+                                                    ZipArchiveHandle* handle, bool own_fd) {
+  const int32_t result = __real__Z13OpenArchiveFdiPKcPP10ZipArchiveb(fd, name, handle, own_fd);
+  open_archives.push_back(*handle);
+  return result;
+}
+}
+
+extern "C" size_t LLVMFuzzerCustomMutator(uint8_t* data, size_t size, size_t max_size,
+                                          unsigned seed) {
+  return MutatePackage(data, size, max_size, seed);
+}
+
+extern "C" int LLVMFuzzerTestOneInput(const uint8_t* data, size_t size) {
+  if (size == 0) return 0;
+  Install();
+  const Bytes archive(data + 1, data + size);
+  const std::string path = TheInstallation().package();
+  WriteFile(path, archive);
+
+  Phone phone;
+  SetUp(phone, data[0]);
+  Judge judge(archive, phone);
+  phone.witness = [&](int fd, const std::string& event) { judge.Witness(fd, event); };
+  RunTool(path);
+  if (most_held > kBytesBesides) {
+    Require(most_held <= kBytesBesides + kBytesPerByte * (size + DeclaredBytes(archive)),
+            "memory is bounded by what the file holds and declares");
+  }
+  for (ZipArchiveHandle handle : open_archives) CloseArchive(handle);
+  open_archives.clear();
+  return 0;
+}
