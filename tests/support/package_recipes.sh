@@ -1,3 +1,5 @@
+# shellcheck shell=bash
+#
 # Recipes for packages and their signers, made with the tools that developers make them with; for
 # scripts/demo and tests/journeys/make_golden_packages to source.
 
