@@ -23,7 +23,6 @@ struct montgomery {
   const mpi* N;
   uint32_t mm;
   mpi_local T;
-
   void multiply(mpi* A, const mpi* B) { mpi_montmul(A, B, N, mm, &T); }
 };
 
@@ -43,7 +42,7 @@ uint32_t estimate_digit(uint32_t high, uint32_t low, uint32_t d);
 uint32_t half_digit(uint32_t* rest, uint32_t next, uint32_t d);
 void shift_r(mpi* X, int count);
 uint32_t montgomery_constant(uint32_t m0);
-int window_size(int exponent_bits);
+int window_size(int bits);
 int fill_window(mpi_local* W, int w, montgomery* m);
 void raise(mpi* X, const mpi* E, const mpi_local* W, int w, montgomery* m);
 
@@ -136,11 +135,9 @@ int mpi_shift_l(mpi* X, int count) {
   const int length = bits + count;
   const int limbs = length / kLimbBits + (length % kLimbBits != 0 ? 1 : 0);
   if (const int result = mpi_grow(X, limbs)) return result;
-
   const int v = count / kLimbBits;
   for (int i = X->n - 1; i >= v; --i) X->p[i] = X->p[i - v];
   for (int i = 0; i < v; ++i) X->p[i] = 0;
-
   const int t = count % kLimbBits;
   if (t == 0) return 0;
   uint32_t carry = 0;
@@ -258,7 +255,6 @@ int mpi_pow_mod(mpi* X, const mpi* A, const mpi* E, const mpi* N) {
   if (const int result = mpi_grow(&RR, 1)) return result;
   one.p[0] = 1;
   RR.p[0] = 1;
-
   // A product with R^2 mod N, R = 2^(32 * N.n), takes a number into Montgomery form, one with 1
   // takes it out again.
   if (const int result = mpi_shift_l(&RR, 2 * kLimbBits * N->n)) return result;
@@ -266,10 +262,9 @@ int mpi_pow_mod(mpi* X, const mpi* A, const mpi* E, const mpi* N) {
   const bool reduced = mpi_compare(A, N) < 0;
   if (const int result = reduced ? mpi_assign(&W[1], A) : mpi_mod_mpi(&W[1], A, N)) return result;
   m.multiply(&W[1], &RR);
-  if (const int result = fill_window(W, w, &m)) return result;
-
   if (const int result = mpi_assign(X, &RR)) return result;
   m.multiply(X, &one);
+  if (const int result = fill_window(W, w, &m)) return result;
   raise(X, E, W, w, &m);
   m.multiply(X, &one);
   return 0;
@@ -428,11 +423,9 @@ uint32_t half_digit(uint32_t* rest, uint32_t next, uint32_t d) {
   uint32_t q = *rest / d1;
   uint32_t r = ((*rest - q * d1) << 16) | next;
   const uint32_t m = q * d0;
-  if (r < m) {
-    do {
-      --q;
-      r += d;
-    } while (r >= d && r < m);
+  for (bool wrapped = false; r < m && !wrapped; --q) {
+    r += d;
+    wrapped = r < d;
   }
   *rest = r - m;
   return q;
@@ -456,14 +449,10 @@ uint32_t montgomery_constant(uint32_t m0) {
   return 0 - x;
 }
 
-// How many bits of the exponent one product takes in. Deliberate: there is no window of 2;
-// exponents as short as that have few set bits in practice, and it would gain nothing.
-int window_size(int exponent_bits) {
-  return exponent_bits > 671   ? 6
-         : exponent_bits > 239 ? 5
-         : exponent_bits > 79  ? 4
-         : exponent_bits > 23  ? 3
-                               : 1;
+// How many bits of an exponent of `bits` bits one product takes in. Deliberate: there is no window
+// of 2; exponents as short as that have few set bits in practice, and it would gain nothing.
+int window_size(int bits) {
+  return bits > 671 ? 6 : bits > 239 ? 5 : bits > 79 ? 4 : bits > 23 ? 3 : 1;
 }
 
 // From W[1] makes the powers W[i] = W[1]^i whose index has w bits, highest bit set: a window begins

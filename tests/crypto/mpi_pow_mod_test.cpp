@@ -87,7 +87,9 @@ TEST(MpiMontmul, IsTheProductOverR) {
 TEST(MpiMontmul, TakesAFactorShorterOrLongerThanTheModulus) {
   const Number N({0xfffffff1, 0xfffffff1});
   const mpz_class modulus = Value(N);
-  for (const Limbs& limbs : {Limbs{5}, Limbs{5, 0}, Limbs{5, 0, 0, 0, 0}}) {
+  Limbs longer(20);
+  longer[0] = 5;
+  for (const Limbs& limbs : {Limbs{5}, Limbs{5, 0}, longer}) {
     Number A({7, 8, 0});
     Number B(limbs);
     Number T(Limbs(6));
