@@ -1,1 +1,332 @@
+// From the start of the block to the signer's public key.
 #include "crypto/pkcs7.h"
+
+#include <gtest/gtest.h>
+#include <openssl/bn.h>
+
+#include <algorithm>
+#include <cstddef>
+#include <cstring>
+
+#include "crypto/processed_block.h"
+#include "support/keys.h"
+
+namespace {
+
+Bytes ModulusOf(const std::string& key) {
+  const BIGNUM* n = RSA_get0_n(TestRsaKey(key));
+  Bytes modulus(BN_num_bytes(n));
+  BN_bn2bin(n, modulus.data());
+  return modulus;
+}
+
+// Where `part` is in `whole`; fails the test when it is nowhere.
+size_t Find(const Bytes& whole, const Bytes& part) {
+  const auto found = std::search(whole.begin(), whole.end(), part.begin(), part.end());
+  EXPECT_NE(found, whole.end());
+  return static_cast<size_t>(found - whole.begin());
+}
+
+}  // namespace
+
+TEST(ProcessCert, GoodBlockGivesKeySignaturesAndTbs) {
+  for (const Digest digest : {Digest::kMd5, Digest::kSha1, Digest::kSha256}) {
+    SignatureBlock block;
+    block.digest = digest;
+    const ProcessedBlock processed(block);
+    const pkcs7& record = processed.record;
+    ASSERT_EQ(processed.result, 0);
+    EXPECT_EQ(processed.output, "");
+    const Bytes tbs = block.SignerCertificate().Tbs();
+    EXPECT_EQ(Field(record.modulus, record.modulus_length), ModulusOf("rsa-2048"));
+    EXPECT_EQ(Field(record.tbs_data, record.tbs_data_length), tbs);
+    EXPECT_EQ(Field(record.cert_signature, record.cert_signature_length),
+              SignWith("rsa-2048", digest, tbs));
+    EXPECT_EQ(Field(record.signed_digest, record.signed_digest_length),
+              SignWith("rsa-2048", digest, kSignatureFile));
+  }
+}
+
+TEST(ProcessCert, OnlyTheFirstCertificateIsUsed) {
+  SignatureBlock block;
+  block.certificates = Concat({block.SignerCertificate().Build(), Bytes(20, 0xff)});
+  const ProcessedBlock processed(block);
+  EXPECT_EQ(processed.result, 0);
+  EXPECT_EQ(Field(processed.record.modulus, processed.record.modulus_length),
+            ModulusOf("rsa-2048"));
+}
+
+TEST(ProcessCert, LabelsOfTheOuterElementsAreNotLookedAt) {
+  Bytes bytes = WithRsaKey(Bytes(64, 0x77), {3}).Build(kSignatureFile);
+  bytes[0] = 0x04;
+  ASSERT_EQ(bytes[1], 0x82);  // two octets of length, then the contentType
+  ASSERT_EQ(bytes[4], 0x06);
+  bytes[4] = 0x99;
+  EXPECT_EQ(ProcessedBlock(bytes).result, 0);
+}
+
+TEST(ProcessCertHeader, FirstByteThatStartsNoHeaderGivesThePlainLine) {
+  for (const char* digits : {"ff ff ff", "30 ff", "1f 81", "30 85 00 00 00 00 00"}) {
+    const ProcessedBlock processed(FromHex(digits));
+    EXPECT_EQ(processed.result, 1);
+    EXPECT_EQ(processed.output,
+              std::string("CERT_PARCER [ERROR]: CANT PROCESS CERTIFICATE TAG\n") + kHeaderTrailer);
+  }
+}
+
+TEST(ProcessCertHeader, EmptyBlockGivesThePlainLine) {
+  const ProcessedBlock processed{Bytes()};
+  EXPECT_EQ(processed.result, 1);
+  EXPECT_EQ(processed.output,
+            std::string("CERT_PARCER [ERROR]: CANT PROCESS CERTIFICATE TAG\n") + kHeaderTrailer);
+}
+
+TEST(ProcessCertHeader, UnreadableContentTypeGivesThePlainLine) {
+  for (const char* digits : {"30 00", "30 01 06", "30 02 06 05"}) {
+    const ProcessedBlock processed(FromHex(digits));
+    EXPECT_EQ(processed.result, 1);
+    EXPECT_EQ(processed.output,
+              std::string("CERT_PARCER [ERROR]: CANT PROCESS CERTIFICATE TAG\n") + kHeaderTrailer);
+  }
+}
+
+TEST(ProcessCertHeader, UnreadableLaterHeadersGiveTheirTagAndTheDistanceToNull) {
+  // The elements before, then an octet that starts an element and nothing else: the [0] of the
+  // content, the SignedData, its version, digestAlgorithms, contentInfo and certificates.
+  const std::pair<const char*, uint32_t> cases[] = {
+      {"30 04 06 01 2a a0", 0},
+      {"30 06 06 01 2a a0 01 30", 16},
+      {"30 08 06 01 2a a0 03 30 01 02", 2},
+      {"30 0b 06 01 2a a0 06 30 04 02 01 01 31", 17},
+      {"30 0d 06 01 2a a0 08 30 06 02 01 01 31 00 30", 16},
+      {"30 0f 06 01 2a a0 0a 30 08 02 01 01 31 00 30 00 a7", 7},
+  };
+  for (const auto& [digits, tag] : cases) {
+    const ProcessedBlock processed(FromHex(digits));
+    EXPECT_EQ(processed.result, 1);
+    EXPECT_EQ(processed.output, processed.UnreadableTag(tag) + kHeaderTrailer) << digits;
+  }
+}
+
+TEST(ProcessCertHeader, HeaderThatWouldStartAtOrBeyondTheEndHasTagZero) {
+  // The contentType ends with the block, and two bytes beyond it.
+  for (const char* digits : {"30 03 06 01 2a", "30 03 06 03 2a"}) {
+    const ProcessedBlock processed(FromHex(digits));
+    EXPECT_EQ(processed.result, 1);
+    EXPECT_EQ(processed.output, processed.UnreadableTag(0) + kHeaderTrailer) << digits;
+  }
+}
+
+TEST(ProcessCertHeader, LengthsAreComparedWithTheWholeBlockFromEachPosition) {
+  // Of the elements before the certificates, the SignedData may run past the block's end as long as
+  // its length is no more than the block's, less its own header.
+  Bytes bytes = WithRsaKey(Bytes(64, 0x77), {3}).Build(kSignatureFile);
+  const size_t signed_data = Find(bytes, FromHex("02 01 01 31")) - 4;
+  ASSERT_EQ(bytes[signed_data + 1], 0x82);
+  const size_t most = bytes.size() - 4;
+  bytes[signed_data + 2] = static_cast<uint8_t>(most >> 8);
+  bytes[signed_data + 3] = static_cast<uint8_t>(most);
+  EXPECT_EQ(ProcessedBlock(bytes).result, 0);
+
+  bytes[signed_data + 2] = static_cast<uint8_t>((most + 1) >> 8);
+  bytes[signed_data + 3] = static_cast<uint8_t>(most + 1);
+  const ProcessedBlock processed(bytes);
+  EXPECT_EQ(processed.result, 1);
+  EXPECT_EQ(processed.output, processed.UnreadableTag(16) + kHeaderTrailer);
+}
+
+TEST(ProcessCertCertificate, EmptySetOfCertificatesGivesMinus2) {
+  SignatureBlock block;
+  block.certificates = Bytes();
+  const ProcessedBlock processed(block);
+  EXPECT_EQ(processed.result, 1);
+  EXPECT_EQ(processed.output, "CERT_PARCER [ERROR]: x509_certificate_parse() error -2\n");
+}
+
+TEST(ProcessCertCertificate, MalformedCertificateGivesItsCode) {
+  Certificate certificate;
+  certificate.version = der::Context(0, der::Integer(3));
+  SignatureBlock block;
+  block.certificates = certificate.Build();
+  const ProcessedBlock processed(block);
+  EXPECT_EQ(processed.result, 1);
+  EXPECT_EQ(processed.output, "CERT_PARCER [ERROR]: x509_certificate_parse() error -9\n");
+  EXPECT_EQ(processed.record.tbs_data, nullptr);
+}
+
+TEST(ProcessCertCertificate, SetThatRunsPastTheEndIsReadUpToTheEnd) {
+  Certificate certificate;
+  certificate.public_key_info = PublicKeyInfoAround({});
+  Bytes certificates = der::Context(0, certificate.Build());
+  EXPECT_EQ(ProcessedBlock(BlockEndingIn(certificates)).output,
+            std::string(kUnreadable) + kKeyTrailer);
+  certificates.pop_back();
+  EXPECT_EQ(ProcessedBlock(BlockEndingIn(certificates)).output,
+            "CERT_PARCER [ERROR]: x509_certificate_parse() error -3\n");
+  // Nothing but the header of the [0] is left.
+  EXPECT_EQ(ProcessedBlock(BlockEndingIn(FromHex("a0 05"))).output,
+            "CERT_PARCER [ERROR]: x509_certificate_parse() error -2\n");
+}
+
+TEST(ProcessCertKey, EcPointGivesTheSequenceLine) {
+  const Bytes point = Concat({{0x04, 0x20}, Bytes(63, 0x11)});  // 0x04, X, Y
+  Certificate certificate;
+  certificate.key = "ec-p256";
+  certificate.public_key_info =
+      der::Sequence({AlgorithmIdentifier("1.2.840.10045.2.1", der::Oid("1.2.840.10045.3.1.7")),
+                     der::BitString(point)});
+  SignatureBlock block;
+  block.certificates = certificate.Build();
+  const ProcessedBlock processed(block);
+  EXPECT_EQ(processed.result, 1);
+  EXPECT_EQ(processed.output, std::string(kNoSequence) + kKeyTrailer);
+  EXPECT_EQ(processed.record.modulus, nullptr);
+}
+
+TEST(ProcessCertKey, EcPointWhoseSecondByteIsNoFittingLengthGivesTheUnreadableLine) {
+  const ProcessedBlock processed(WithPublicKey(Concat({{0x04, 0x7f}, Bytes(63, 0x11)})));
+  EXPECT_EQ(processed.result, 1);
+  EXPECT_EQ(processed.output, std::string(kUnreadable) + kKeyTrailer);
+}
+
+TEST(ProcessCertKey, UnreadableKeyGivesTheUnreadableLine) {
+  // Nothing, a SEQUENCE that runs past the end, one without a modulus, one with half of one.
+  for (const char* digits : {"", "30", "30 05 02 01 03", "30 00", "30 01 02", "30 02 02 05"}) {
+    const ProcessedBlock processed(WithPublicKey(FromHex(digits)));
+    EXPECT_EQ(processed.result, 1);
+    EXPECT_EQ(processed.output, std::string(kUnreadable) + kKeyTrailer) << digits;
+  }
+}
+
+TEST(ProcessCertKey, ClassesAreNotLookedAt) {
+  // A [16] of a [2] and a [2].
+  const Bytes modulus(64, 0x77);
+  const ProcessedBlock processed(WithPublicKey(der::Context(
+      16, Concat({der::ContextPrimitive(2, modulus), der::ContextPrimitive(2, {3})}))));
+  EXPECT_EQ(processed.result, 0);
+  EXPECT_EQ(Field(processed.record.modulus, processed.record.modulus_length), modulus);
+}
+
+TEST(ProcessCertKey, ModulusThatIsNoIntegerGivesTheIntegerLine) {
+  const ProcessedBlock processed(
+      WithPublicKey(der::Sequence({der::OctetString(Bytes(64, 0x77)), der::Integer(3)})));
+  EXPECT_EQ(processed.result, 1);
+  EXPECT_EQ(processed.output, std::string(kNoInteger) + kKeyTrailer);
+  EXPECT_EQ(processed.record.modulus, nullptr);
+}
+
+TEST(ProcessCertKey, ModulusThatStartsWithZeroLosesIt) {
+  const ProcessedBlock processed(WithRsaKey(Concat({{0x00}, Bytes(64, 0x99)}), {3}));
+  EXPECT_EQ(processed.result, 0);
+  EXPECT_EQ(Field(processed.record.modulus, processed.record.modulus_length), Bytes(64, 0x99));
+}
+
+TEST(ProcessCertKey, ModulusThatDoesNotStartWithZeroIsTakenWhole) {
+  const ProcessedBlock processed(WithRsaKey(Bytes(64, 0x77), {3}));
+  EXPECT_EQ(processed.result, 0);
+  EXPECT_EQ(Field(processed.record.modulus, processed.record.modulus_length), Bytes(64, 0x77));
+}
+
+TEST(ProcessCertKey, ModulusLosesExactlyOneZero) {
+  const Bytes rest = Concat({{0x00}, Bytes(64, 0x99)});
+  const ProcessedBlock processed(WithRsaKey(Concat({{0x00}, rest}), {3}));
+  EXPECT_EQ(processed.result, 0);
+  EXPECT_EQ(Field(processed.record.modulus, processed.record.modulus_length), rest);
+}
+
+TEST(ProcessCertKey, EmptyModulusLeavesNoRoomForTheExponent) {
+  const ProcessedBlock processed(WithRsaKey({}, {3}));
+  EXPECT_EQ(processed.result, 1);
+  EXPECT_EQ(processed.output, std::string(kUnreadable) + kKeyTrailer);
+  EXPECT_EQ(processed.record.modulus_length, 0u);
+}
+
+TEST(ProcessCertKey, ExponentIsComparedWithTheLengthOfTheModulus) {
+  // The exponent takes five bytes: header 02 03, contents 01 00 01.
+  EXPECT_EQ(ProcessedBlock(WithRsaKey(Bytes(5, 0x77), {1, 0, 1})).result, 0);
+  const ProcessedBlock processed(WithRsaKey(Bytes(4, 0x77), {1, 0, 1}));
+  EXPECT_EQ(processed.result, 1);
+  EXPECT_EQ(processed.output, std::string(kUnreadable) + kKeyTrailer);
+  EXPECT_EQ(processed.record.modulus_length, 4u);
+}
+
+TEST(ProcessCertKey, ExponentMayStandBehindTheKey) {
+  const ProcessedBlock processed(
+      WithPublicKey(Concat({der::Sequence({der::Integer(Bytes(64, 0x77))}), der::Integer(3)})));
+  EXPECT_EQ(processed.result, 0);
+  EXPECT_EQ(processed.record.exponent[0], 3);
+}
+
+TEST(ProcessCertKey, ExponentThatIsNoIntegerGivesTheIntegerLine) {
+  const ProcessedBlock processed(
+      WithPublicKey(der::Sequence({der::Integer(Bytes(64, 0x77)), der::OctetString({3})})));
+  EXPECT_EQ(processed.result, 1);
+  EXPECT_EQ(processed.output, std::string(kNoInteger) + kKeyTrailer);
+  EXPECT_EQ(processed.record.modulus_length, 64u);
+}
+
+TEST(ProcessCertKey, ExponentMustLieInTheBlock) {
+  // Its header ends the key; its length takes in the rest of the block and fits the modulus.
+  SignatureBlock block =
+      WithPublicKey(Concat({der::Sequence({der::Integer(Bytes(200, 0x77))}), {0x02, 0x81, 0x00}}));
+  block.signer_infos = Bytes();
+  Bytes bytes = block.Build(kSignatureFile);
+  const size_t length_at = Find(bytes, {0x02, 0x81, 0x00}) + 2;
+  const size_t rest = bytes.size() - (length_at + 1);
+  ASSERT_LT(rest, 190u);
+
+  bytes[length_at] = static_cast<uint8_t>(rest);
+  EXPECT_EQ(ProcessedBlock(bytes).output, std::string(kUnreadable) + kSignerTrailer);
+  bytes[length_at] = static_cast<uint8_t>(rest + 1);
+  EXPECT_EQ(ProcessedBlock(bytes).output, std::string(kUnreadable) + kKeyTrailer);
+}
+
+TEST(ProcessCertKey, ExponentOf65537Is01000100) {
+  const ProcessedBlock processed{SignatureBlock()};
+  EXPECT_EQ(processed.result, 0);
+  EXPECT_EQ(Field(processed.record.exponent, 4), FromHex("01 00 01 00"));
+}
+
+TEST(ProcessCertKey, ExponentIsCopiedAsItIsWithZerosBehind) {
+  const std::pair<const char*, const char*> cases[] = {{"", "00 00 00 00"},
+                                                       {"03", "03 00 00 00"},
+                                                       {"00 01 00 01", "00 01 00 01"},
+                                                       {"ff ff ff ff", "ff ff ff ff"}};
+  for (const auto& [contents, expected] : cases) {
+    const ProcessedBlock processed(WithRsaKey(Bytes(64, 0x77), FromHex(contents)));
+    EXPECT_EQ(processed.result, 0);
+    EXPECT_EQ(Field(processed.record.exponent, 4), FromHex(expected)) << contents;
+    EXPECT_EQ(processed.record.modulus_length, 64u);
+  }
+}
+
+TEST(ProcessCertKey, LongerExponentRunsOnIntoTheModulusLength) {
+  // The modulus length is 64, 40 00 00 00 in memory.
+  const std::pair<const char*, const char*> cases[] = {
+      {"11 22 33 44 55", "11 22 33 44 55 00 00 00"},
+      {"11 22 33 44 55 66 77 88", "11 22 33 44 55 66 77 88"}};
+  for (const auto& [contents, expected] : cases) {
+    const ProcessedBlock processed(WithRsaKey(Bytes(64, 0x77), FromHex(contents)));
+    EXPECT_EQ(processed.result, 0);
+    Bytes memory(8);
+    memcpy(memory.data(), processed.record.exponent, 4);
+    memcpy(memory.data() + 4, &processed.record.modulus_length, 4);
+    EXPECT_EQ(memory, FromHex(expected)) << contents;
+  }
+}
+
+TEST(ProcessCertKey, ExponentEndsWithTheRecord) {
+  Bytes exponent(40, 0xee);
+  const Bytes block = WithRsaKey(Bytes(64, 0x77), exponent).Build(kSignatureFile);
+  struct {
+    pkcs7 record;
+    uint8_t behind[32];
+  } place;
+  memset(&place, 0x11, sizeof(place));
+  EXPECT_EQ(processCert(block.data(), static_cast<uint32_t>(block.size()), &place.record), 0);
+  EXPECT_EQ(place.record.modulus_length, 0xeeeeeeeeu);
+  Bytes after(sizeof(place) - offsetof(pkcs7, modulus_length) - 4);
+  memcpy(after.data(), reinterpret_cast<uint8_t*>(&place) + sizeof(place) - after.size(),
+         after.size());
+  EXPECT_EQ(after, Bytes(after.size(), 0x11));
+}

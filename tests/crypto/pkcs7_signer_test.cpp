@@ -1,0 +1,231 @@
+// The first SignerInfo, and what no damage to a block may do.
+#include <gtest/gtest.h>
+
+#include <cstdlib>
+#include <fstream>
+#include <iterator>
+
+#include "crypto/processed_block.h"
+#include "support/keys.h"
+
+namespace {
+
+// A block with these signerInfos.
+SignatureBlock WithSigners(const Bytes& signer_infos) {
+  SignatureBlock block = WithRsaKey(Bytes(64, 0x77), {3});
+  block.signer_infos = signer_infos;
+  return block;
+}
+
+// A SET of one SignerInfo, of a good start and these elements.
+Bytes SignerOf(const std::vector<Bytes>& elements) {
+  return der::Set({der::Sequence({der::Integer(1), der::Sequence({}), Concat(elements)})});
+}
+
+const Bytes& Sha256Algorithm() {
+  static const auto& algorithm = *new Bytes(AlgorithmIdentifier(DigestOid(Digest::kSha256)));
+  return algorithm;
+}
+
+// Whether all that lies in the block according to the record does.
+bool Inside(const Bytes& block, const pkcs7& record) {
+  const auto inside = [&](const uint8_t* value, size_t length) {
+    if (value == nullptr) return length == 0;
+    return value >= block.data() && value <= block.data() + block.size() &&
+           length <= static_cast<size_t>(block.data() + block.size() - value);
+  };
+  return inside(record.tbs_data, record.tbs_data_length) &&
+         inside(record.cert_signature, record.cert_signature_length) && inside(record.modulus, 0) &&
+         inside(record.signed_digest, 0);
+}
+
+// The block, damaged before the call.
+bool StaysInside(const Bytes& block) {
+  pkcs7 record = {};
+  const int result = processCert(block.data(), static_cast<uint32_t>(block.size()), &record);
+  return (result == 0 || result == 1) && Inside(block, record);
+}
+
+}  // namespace
+
+TEST(ProcessCertSigner, UnreadableHeadersGiveTheUnreadableLine) {
+  // No signerInfos, half of a header, no SignerInfo, no version, no issuer, half of an issuer.
+  for (const char* digits : {"", "31", "31 05", "31 00", "31 02 30 00", "31 05 30 03 02 01 01",
+                             "31 07 30 05 02 01 01 30 05"}) {
+    const ProcessedBlock processed(WithSigners(FromHex(digits)));
+    EXPECT_EQ(processed.result, 1);
+    EXPECT_EQ(processed.output, std::string(kUnreadable) + kSignerTrailer) << digits;
+    EXPECT_EQ(processed.record.modulus_length, 64u);
+    EXPECT_EQ(processed.record.signed_digest, nullptr);
+  }
+}
+
+TEST(ProcessCertSigner, SignersThatWouldStartBeyondTheEndGiveTheUnreadableLine) {
+  // The [0] of the certificates, at the end of the block, claims five bytes more.
+  const Bytes certificate = *WithRsaKey(Bytes(64, 0x77), {3}).certificates;
+  Bytes certificates = der::Context(0, Concat({certificate, Bytes(5)}));
+  certificates.resize(certificates.size() - 5);
+  const ProcessedBlock processed(BlockEndingIn(certificates));
+  EXPECT_EQ(processed.result, 1);
+  EXPECT_EQ(processed.output, std::string(kUnreadable) + kSignerTrailer);
+}
+
+TEST(ProcessCertSigner, MalformedDigestAlgorithmGivesItsLine) {
+  const Bytes rest = Concat({AlgorithmIdentifier("1.2.3"), der::OctetString(Bytes(8))});
+  const Bytes cases[] = {
+      SignerOf({}),                                               // none
+      SignerOf({{0x30}}),                                         // half of a header
+      SignerOf({der::Set({der::Oid("1.2.3")}), rest}),            // no SEQUENCE
+      SignerOf({der::Context(16, der::Oid("1.2.3")), rest}),      // another class
+      SignerOf({der::Sequence({}), rest}),                        // no OID
+      SignerOf({der::Sequence({der::Null()}), rest}),             // no OID either
+      SignerOf({der::Sequence({FromHex("06 00")}), rest}),        // an empty one
+      SignerOf({der::Sequence({FromHex("06 02 2a 86")}), rest}),  // one that ends within an arc
+  };
+  for (const Bytes& signer_infos : cases) {
+    const ProcessedBlock processed(WithSigners(signer_infos));
+    EXPECT_EQ(processed.result, 1);
+    EXPECT_EQ(processed.output, std::string(kNoAlgorithm) + kSignerTrailer);
+    EXPECT_EQ(processed.record.signed_digest, nullptr);
+  }
+}
+
+TEST(ProcessCertSigner, DigestAlgorithmMustEndWithinTheSignerInfo) {
+  // The same bytes, with the SignerInfo ending before the digestAlgorithm, within and after it.
+  const Bytes start = Concat({der::Integer(1), der::Sequence({})});
+  const Bytes rest = Concat({AlgorithmIdentifier("1.2.3"), der::OctetString(Bytes(8, 1))});
+  const size_t algorithm_end = start.size() + Sha256Algorithm().size();
+  for (const size_t length : {start.size() - 1, start.size(), algorithm_end - 1, algorithm_end}) {
+    const Bytes signer = Concat(
+        {{0x31, 0x00}, {0x30, static_cast<uint8_t>(length)}, start, Sha256Algorithm(), rest});
+    const ProcessedBlock processed(WithSigners(signer));
+    const bool good = length == algorithm_end;
+    EXPECT_EQ(processed.result, good ? 0 : 1);
+    EXPECT_EQ(processed.output, good ? "" : std::string(kNoAlgorithm) + kSignerTrailer);
+  }
+}
+
+TEST(ProcessCertSigner, AnyDigestAlgorithmAndParametersAreAccepted) {
+  for (const Bytes& parameters : {Bytes(), der::Null(), der::Oid("1.2.3"), FromHex("06 00")}) {
+    SignatureBlock block = WithRsaKey(Bytes(64, 0x77), {3});
+    block.digest_algorithm = AlgorithmIdentifier("1.2.3.4", parameters);
+    EXPECT_EQ(ProcessedBlock(block).result, 0);
+  }
+}
+
+TEST(ProcessCertSigner, MissingEncryptedDigestGivesTheUnreadableLine) {
+  // No digestEncryptionAlgorithm, half of one's header, no encryptedDigest, half of one's header.
+  const Bytes algorithm = AlgorithmIdentifier("1.2.3");
+  for (const Bytes& rest : {Bytes(), Bytes{0x30}, algorithm, Concat({algorithm, {0x04}}),
+                            Concat({algorithm, {0x1f}})}) {
+    const ProcessedBlock processed(WithSigners(SignerOf({Sha256Algorithm(), rest})));
+    EXPECT_EQ(processed.result, 1);
+    EXPECT_EQ(processed.output, std::string(kUnreadable) + kSignerTrailer);
+    EXPECT_EQ(processed.record.signed_digest, nullptr);
+  }
+}
+
+TEST(ProcessCertSigner, LastElementsAreComparedWithTheOffsetOfTheDigestAlgorithmsEnd) {
+  const Bytes algorithm = AlgorithmIdentifier("1.2.3");
+  Bytes bytes = WithSigners(SignerOf({Sha256Algorithm(), algorithm, FromHex("04 82 00 00")}))
+                    .Build(kSignatureFile);
+  const size_t bound = bytes.size() - algorithm.size() - 4;
+  const size_t most = bound - 4;
+  bytes[bytes.size() - 2] = static_cast<uint8_t>(most >> 8);
+  bytes[bytes.size() - 1] = static_cast<uint8_t>(most);
+  const ProcessedBlock longest(bytes);
+  EXPECT_EQ(longest.result, 0);
+  EXPECT_EQ(longest.record.signed_digest, longest.bytes.data() + longest.bytes.size());
+  EXPECT_EQ(longest.record.signed_digest_length, most);
+
+  bytes[bytes.size() - 2] = static_cast<uint8_t>((most + 1) >> 8);
+  bytes[bytes.size() - 1] = static_cast<uint8_t>(most + 1);
+  const ProcessedBlock too_long(bytes);
+  EXPECT_EQ(too_long.result, 1);
+  EXPECT_EQ(too_long.output, std::string(kUnreadable) + kSignerTrailer);
+}
+
+TEST(ProcessCertSigner, EncryptedDigestThatWouldStartBeyondTheEndGivesTheUnreadableLine) {
+  const ProcessedBlock processed(
+      WithSigners(SignerOf({Sha256Algorithm(), FromHex("30 10 06 01"), FromHex("04 01 aa")})));
+  EXPECT_EQ(processed.result, 1);
+  EXPECT_EQ(processed.output, std::string(kUnreadable) + kSignerTrailer);
+}
+
+TEST(ProcessCertSigner, AuthenticatedAttributesGiveTheWrongElement) {
+  SignatureBlock block;
+  block.authenticated_attributes = true;
+  const ProcessedBlock processed(block);
+  EXPECT_EQ(processed.result, 0);
+  EXPECT_EQ(processed.output, "");
+  // The contents of the digestEncryptionAlgorithm: rsaEncryption and NULL.
+  EXPECT_EQ(Field(processed.record.signed_digest, processed.record.signed_digest_length),
+            Concat({der::Oid("1.2.840.113549.1.1.1"), der::Null()}));
+}
+
+TEST(ProcessCertBounds, EveryTruncationIsRefused) {
+  const Bytes whole = WithRsaKey(Bytes(64, 0x77), {3}).Build(kSignatureFile);
+  for (size_t length = 0; length < whole.size(); ++length) {
+    const ProcessedBlock processed(
+        Bytes(whole.begin(), whole.begin() + static_cast<ptrdiff_t>(length)));
+    EXPECT_EQ(processed.result, 1) << length;
+    EXPECT_TRUE(Inside(processed.bytes, processed.record)) << length;
+  }
+}
+
+TEST(ProcessCertBounds, EveryTruncationOfABlockOfIndefiniteLengthsStaysInside) {
+  // The SignerInfo ends with its digestAlgorithm, so that it is read as long as that is there.
+  const Bytes whole = BlockEndingIn(Concat({
+      der::Context(0, *WithRsaKey(Bytes(64, 0x77), {3}).certificates),
+      FromHex("31 80 30 14 02 01 01 30 80"),
+      Sha256Algorithm(),
+      AlgorithmIdentifier("1.2.840.113549.1.1.1"),
+      der::OctetString(Bytes(77, 0xa5)),
+  }));
+  EXPECT_EQ(ProcessedBlock(whole).result, 0);
+  for (size_t length = 0; length < whole.size(); ++length) {
+    const ProcessedBlock processed(
+        Bytes(whole.begin(), whole.begin() + static_cast<ptrdiff_t>(length)));
+    EXPECT_TRUE(Inside(processed.bytes, processed.record)) << length;
+  }
+}
+
+TEST(ProcessCertBounds, EveryChangeOfOneByteStaysInside) {
+  Bytes block = WithRsaKey(Bytes(64, 0x77), {3}).Build(kSignatureFile);
+  block.shrink_to_fit();
+  testing::internal::CaptureStdout();
+  size_t outside = 0;
+  for (uint8_t& byte : block) {
+    const uint8_t good = byte;
+    for (const int change : {0x00, 0x01, 0x1f, 0x7f, 0x80, 0x81, 0x82, 0x84, 0xff, good + 1,
+                             good - 1, good ^ 0x80, good ^ 0x20}) {
+      byte = static_cast<uint8_t>(change);
+      if (!StaysInside(block)) ++outside;
+    }
+    byte = good;
+  }
+  testing::internal::GetCapturedStdout();
+  EXPECT_EQ(outside, 0u);
+  EXPECT_EQ(ProcessedBlock(block).result, 0);
+}
+
+TEST(ProcessCert, BlockMadeByOpensslIsRead) {
+  const std::string base = testing::TempDir() + "pkcs7-by-openssl";
+  const std::string key = TestKeyPath("rsa-2048");
+  std::ofstream(base + ".sf", std::ios::binary)
+      .write(reinterpret_cast<const char*>(kSignatureFile.data()),
+             static_cast<std::streamsize>(kSignatureFile.size()));
+  const std::string command = "openssl req -x509 -new -key " + key + " -subj /CN=Test -out " +
+                              base + ".pem 2>/dev/null && openssl smime -sign -noattr -binary " +
+                              "-md sha256 -outform DER -signer " + base + ".pem -inkey " + key +
+                              " -in " + base + ".sf -out " + base + ".rsa";
+  ASSERT_EQ(system(command.c_str()), 0);
+  std::ifstream file(base + ".rsa", std::ios::binary);
+  const ProcessedBlock processed{Bytes(std::istreambuf_iterator<char>(file), {})};
+  ASSERT_EQ(processed.result, 0);
+  const pkcs7& record = processed.record;
+  EXPECT_EQ(Field(record.signed_digest, record.signed_digest_length),
+            SignWith("rsa-2048", Digest::kSha256, kSignatureFile));
+  EXPECT_EQ(Field(record.cert_signature, record.cert_signature_length),
+            SignWith("rsa-2048", Digest::kSha256, Field(record.tbs_data, record.tbs_data_length)));
+}
