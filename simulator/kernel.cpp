@@ -26,6 +26,7 @@ int Verify(int fd);
 int DescriptorError(int fd);
 int CopyPayload(const void* argument, std::string* payload);
 bool CopyIn(const char* from, size_t size, char* to);
+int Scratch();
 void Trust(int fd);
 bool IsTrusted(int fd);
 int Answer(Event* event, int error, int errno_before);
@@ -33,7 +34,9 @@ int Answer(Event* event, int error, int errno_before);
 // The journal shows that the stand-ins are in place; the environment no longer does, and what the
 // tool starts goes without them.
 __attribute__((constructor)) void Attach() {
+  const ErrnoKeeper keeper;
   Record(Event("attached").Number("pid", getpid()));
+  Scratch();
   unsetenv("LD_PRELOAD");
 }
 
@@ -110,9 +113,13 @@ int CopyPayload(const void* argument, std::string* payload) {
 // As the kernel copies from a process: false, and no signal, where there is nothing to read. The
 // way through a file makes the real kernel do it, and works under an emulator, too.
 bool CopyIn(const char* from, size_t size, char* to) {
-  static const int scratch = MoveHigh(memfd_create("payload", MFD_CLOEXEC));
   const ssize_t wanted = static_cast<ssize_t>(size);
-  return pwrite(scratch, from, size, 0) == wanted && pread(scratch, to, size, 0) == wanted;
+  return pwrite(Scratch(), from, size, 0) == wanted && pread(Scratch(), to, size, 0) == wanted;
+}
+
+int Scratch() {
+  static const int scratch = MoveHigh(memfd_create("payload", MFD_CLOEXEC));
+  return scratch;
 }
 
 // The files that this process had signed.

@@ -4,6 +4,22 @@
 
 #include <climits>
 
+namespace {
+
+// Open from the start, so that a process without a free descriptor is recorded all the same.
+int JournalDescriptor() {
+  static const int journal =
+      ThisPhone().journal.empty() ? -1 : OpenJournal(ThisPhone().journal.c_str());
+  return journal;
+}
+
+__attribute__((constructor)) void OpenEarly() {
+  const ErrnoKeeper keeper;
+  JournalDescriptor();
+}
+
+}  // namespace
+
 const Phone& ThisPhone() {
   static const Phone& phone = *new Phone(PhoneFromEnvironment());
   return phone;
@@ -11,9 +27,7 @@ const Phone& ThisPhone() {
 
 void Record(const Event& event) {
   const ErrnoKeeper keeper;
-  static const int journal =
-      ThisPhone().journal.empty() ? -1 : OpenJournal(ThisPhone().journal.c_str());
-  if (journal >= 0) event.AppendTo(journal);
+  if (JournalDescriptor() >= 0) event.AppendTo(JournalDescriptor());
 }
 
 std::string PathOf(int fd) {
