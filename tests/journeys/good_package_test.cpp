@@ -89,6 +89,8 @@ struct Row {
   const char* installed;
 };
 
+void PrintTo(const Row& row, std::ostream* out) { *out << row.entry_name; }
+
 class LibraryDirectory : public testing::TestWithParam<Row> {};
 
 TEST_P(LibraryDirectory, IsWhereTheEntryIsSigned) {
