@@ -147,7 +147,7 @@ TEST(KernelStandIn, KeepsItsDescriptorsHighAndToItself) {
   EXPECT_EQ(run.results[5], "6 77");
   // What a program that the tool turns into would find open is what it would find on its own.
   const std::string inherited = run.results[6];
-  RunProcess({PROBE_PATH, probe.path()});
+  RunProcess({PROBE_COMMAND, probe.path()});
   EXPECT_EQ(inherited, LinesOf(ReadWhole(probe.path() + ".out")).back());
 }
 
@@ -179,9 +179,9 @@ TEST(KernelStandIn, TakesThePreloadOutOfTheEnvironment) {
 TEST(KernelStandIn, WritesNothingToTheStandardStreams) {
   const Probe probe({"sign 3 0000", "verify 3", "log 6 tag 61", "register 3 name ab",
                      "fopen /proc/self/integrity/value r"});
-  const ProcessResult result = RunProcess({"env", std::string("LD_PRELOAD=") + KERNEL_PATH,
-                                           "APKTOOLKIT_SIM_JOURNAL=" + probe.folder() / "journal",
-                                           PROBE_PATH, probe.path()});
+  const ProcessResult result =
+      RunProcess({"env", PRELOAD_KERNEL, "APKTOOLKIT_SIM_JOURNAL=" + probe.folder() / "journal",
+                  PROBE_COMMAND, probe.path()});
   EXPECT_EQ(result.output, "");
   EXPECT_EQ(result.errors, "");
 }

@@ -30,7 +30,7 @@ TEST(Libzu, RecordsADescriptorThatIsNotOpen) {
 
 TEST(Libzu, WithoutAPhoneThereIsNoService) {
   const Probe probe({"register 3 name ab"});
-  const ProcessResult result = RunProcess({PROBE_PATH, probe.path()});
+  const ProcessResult result = RunProcess({PROBE_COMMAND, probe.path()});
   EXPECT_EQ(result.output + result.errors, "");
   EXPECT_EQ(LinesOf(ReadWhole(probe.path() + ".out")), Lines({"fd 3", "-1 77"}));
 }

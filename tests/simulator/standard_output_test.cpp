@@ -34,16 +34,15 @@ TEST(StandardOutput, TextsAreBytes) {
 
 TEST(StandardOutput, ReachesItsDescriptor) {
   const Probe probe({"puts one", "print 74776f"});
-  const ProcessResult result = RunProcess({"env", std::string("LD_PRELOAD=") + KERNEL_PATH,
-                                           "APKTOOLKIT_SIM_JOURNAL=" + probe.folder() / "journal",
-                                           PROBE_PATH, probe.path()});
+  const ProcessResult result =
+      RunProcess({"env", PRELOAD_KERNEL, "APKTOOLKIT_SIM_JOURNAL=" + probe.folder() / "journal",
+                  PROBE_COMMAND, probe.path()});
   EXPECT_EQ(result.output, "one\ntwo");
 }
 
 TEST(StandardOutput, IsLeftAloneWithoutAJournal) {
   const Probe probe({"puts one", "sign 3 0000"});
-  const ProcessResult result =
-      RunProcess({"env", std::string("LD_PRELOAD=") + KERNEL_PATH, PROBE_PATH, probe.path()});
+  const ProcessResult result = RunProcess({"env", PRELOAD_KERNEL, PROBE_COMMAND, probe.path()});
   EXPECT_EQ(result.output, "one\n");
   EXPECT_EQ(LinesOf(ReadWhole(probe.path() + ".out")), Lines({"fd 3", "4 77", "0 77"}));
 }
