@@ -1,0 +1,9 @@
+# What is installed beside the programs: manual pages, completion and documents.
+install(FILES man/apktoolkit.1 DESTINATION ${CMAKE_INSTALL_MANDIR}/man1)
+install(FILES README.md CHANGES.md DESTINATION ${CMAKE_INSTALL_DOCDIR})
+install(DIRECTORY docs DESTINATION ${CMAKE_INSTALL_DOCDIR})
+if(APKTOOLKIT_SIMULATOR)
+  install(FILES man/apktoolkit-sim.1 DESTINATION ${CMAKE_INSTALL_MANDIR}/man1)
+  install(FILES simulator/apktoolkit-sim.bash RENAME apktoolkit-sim
+    DESTINATION ${CMAKE_INSTALL_DATADIR}/bash-completion/completions)
+endif()
