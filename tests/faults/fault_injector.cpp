@@ -1,0 +1,180 @@
+// A library to be loaded before all others: makes one call of one C library function fail, counted
+// from the moment when main() starts.
+//
+//   APKTOOLKIT_FAULT         the function's name, ":", and the number of its call, from 1
+//   APKTOOLKIT_FAULT_REPORT  a file that is made when that call comes
+//
+// Calls from the simulated phone's own libraries are passed on and not counted, those for memory
+// excepted.
+//
+// The names are malloc, open, read, fopen, readlink, fgetxattr, fstatvfs and fcntl. A function
+// under several names (open and open64) counts as one, as do malloc, calloc and realloc.
+#include <dlfcn.h>
+#include <fcntl.h>
+#include <signal.h>
+#include <sys/statvfs.h>
+#include <sys/syscall.h>
+#include <sys/types.h>
+#include <ucontext.h>
+#include <unistd.h>
+
+#include <cerrno>
+#include <cstdarg>
+#include <cstdio>
+#include <cstdlib>
+#include <cstring>
+
+extern "C" {
+void* __libc_malloc(size_t size);
+void* __libc_calloc(size_t count, size_t size);
+void* __libc_realloc(void* block, size_t size);
+}
+
+namespace {
+
+char function[32];
+long calls_left = -1;  // until the one that fails; below 0: none will
+const char* report = nullptr;
+
+// Whether the code at `address` is part of the shared library whose path holds `name`.
+bool IsIn(const char* name, const void* address) {
+  Dl_info info;
+  return dladdr(address, &info) != 0 && info.dli_fname != nullptr &&
+         strstr(info.dli_fname, name) != nullptr;
+}
+
+// The platform's String8 takes its memory for granted and runs into a null pointer where its other
+// containers abort. It is made to abort as well, so that no other crash can hide behind it.
+void AbortForString8(int, siginfo_t*, void* context) {
+#ifdef __x86_64__
+  const auto at = static_cast<ucontext_t*>(context)->uc_mcontext.gregs[REG_RIP];
+  if (IsIn("/android/libutils.so", reinterpret_cast<void*>(at))) abort();
+#endif
+  signal(SIGSEGV, SIG_DFL);
+}
+
+void Arm() {
+  const char* const fault = getenv("APKTOOLKIT_FAULT");
+  const char* const colon = fault == nullptr ? nullptr : strchr(fault, ':');
+  if (colon == nullptr || colon - fault >= static_cast<long>(sizeof(function))) return;
+  memcpy(function, fault, static_cast<size_t>(colon - fault));
+  report = getenv("APKTOOLKIT_FAULT_REPORT");
+  calls_left = strtol(colon + 1, nullptr, 10);
+  if (strcmp(function, "malloc") != 0) return;
+  struct sigaction action = {};
+  action.sa_sigaction = AbortForString8;
+  action.sa_flags = SA_SIGINFO;
+  sigaction(SIGSEGV, &action, nullptr);
+}
+
+// Whether this call of the function is the one. Calls no function that could fail itself.
+bool Fails(const char* name, int error, const void* caller = nullptr) {
+  if (calls_left <= 0 || strcmp(name, function) != 0) return false;
+  if (caller != nullptr && IsIn("/lib/apktoolkit/", caller)) return false;
+  if (--calls_left != 0) return false;
+  const long file = syscall(SYS_openat, AT_FDCWD, report, O_WRONLY | O_CREAT, 0600);
+  syscall(SYS_close, file);
+  errno = error;
+  return true;
+}
+
+// What the program would call without this library.
+template <typename Function>
+Function* Meant(const char* name) {
+  return reinterpret_cast<Function*>(dlsym(RTLD_NEXT, name));
+}
+
+using Main = int(int, char**, char**);
+Main* real_main = nullptr;
+
+int ArmAndStart(int argc, char** argv, char** environment) {
+  Arm();
+  return real_main(argc, argv, environment);
+}
+
+using StartMain = int(Main*, int, char**, void (*)(), void (*)(), void (*)(), void*);
+
+}  // namespace
+
+extern "C" int __libc_start_main(Main* program, int argc, char** argv, void (*init)(),
+                                 void (*fini)(), void (*rtld_fini)(), void* stack_end) {
+  real_main = program;
+  return Meant<StartMain>("__libc_start_main")(ArmAndStart, argc, argv, init, fini, rtld_fini,
+                                               stack_end);
+}
+
+extern "C" void* malloc(size_t size) {
+  return Fails("malloc", ENOMEM) ? nullptr : __libc_malloc(size);
+}
+extern "C" void* calloc(size_t count, size_t size) {
+  return Fails("malloc", ENOMEM) ? nullptr : __libc_calloc(count, size);
+}
+extern "C" void* realloc(void* block, size_t size) {
+  return Fails("malloc", ENOMEM) ? nullptr : __libc_realloc(block, size);
+}
+
+extern "C" ssize_t read(int fd, void* buffer, size_t size) {
+  static auto* const meant = Meant<ssize_t(int, void*, size_t)>("read");
+  return Fails("read", EIO, __builtin_return_address(0)) ? -1 : meant(fd, buffer, size);
+}
+extern "C" ssize_t readlink(const char* path, char* buffer, size_t size) {
+  static auto* const meant = Meant<ssize_t(const char*, char*, size_t)>("readlink");
+  return Fails("readlink", EIO, __builtin_return_address(0)) ? -1 : meant(path, buffer, size);
+}
+extern "C" ssize_t fgetxattr(int fd, const char* name, void* value, size_t size) {
+  static auto* const meant = Meant<ssize_t(int, const char*, void*, size_t)>("fgetxattr");
+  return Fails("fgetxattr", EIO, __builtin_return_address(0)) ? -1 : meant(fd, name, value, size);
+}
+extern "C" int fstatvfs(int fd, struct statvfs* state) {
+  static auto* const meant = Meant<int(int, struct statvfs*)>("fstatvfs");
+  return Fails("fstatvfs", EIO, __builtin_return_address(0)) ? -1 : meant(fd, state);
+}
+
+extern "C" int fstatvfs64(int fd, struct statvfs64* state) {
+  static auto* const meant = Meant<int(int, struct statvfs64*)>("fstatvfs64");
+  return Fails("fstatvfs", EIO, __builtin_return_address(0)) ? -1 : meant(fd, state);
+}
+
+extern "C" FILE* fopen(const char* path, const char* mode) {
+  static auto* const meant = Meant<FILE*(const char*, const char*)>("fopen");
+  return Fails("fopen", EMFILE, __builtin_return_address(0)) ? nullptr : meant(path, mode);
+}
+extern "C" FILE* fopen64(const char* path, const char* mode) {
+  static auto* const meant = Meant<FILE*(const char*, const char*)>("fopen64");
+  return Fails("fopen", EMFILE, __builtin_return_address(0)) ? nullptr : meant(path, mode);
+}
+
+// The mode is read even where none is given: it then is not looked at.
+extern "C" int open(const char* path, int flags, ...) {
+  static auto* const meant = Meant<int(const char*, int, ...)>("open");
+  va_list arguments;
+  va_start(arguments, flags);
+  const auto mode = va_arg(arguments, mode_t);
+  va_end(arguments);
+  return Fails("open", EMFILE, __builtin_return_address(0)) ? -1 : meant(path, flags, mode);
+}
+extern "C" int open64(const char* path, int flags, ...) {
+  static auto* const meant = Meant<int(const char*, int, ...)>("open64");
+  va_list arguments;
+  va_start(arguments, flags);
+  const auto mode = va_arg(arguments, mode_t);
+  va_end(arguments);
+  return Fails("open", EMFILE, __builtin_return_address(0)) ? -1 : meant(path, flags, mode);
+}
+
+extern "C" int fcntl(int fd, int command, ...) {
+  static auto* const meant = Meant<int(int, int, ...)>("fcntl");
+  va_list arguments;
+  va_start(arguments, command);
+  void* const argument = va_arg(arguments, void*);
+  va_end(arguments);
+  return Fails("fcntl", EIO, __builtin_return_address(0)) ? -1 : meant(fd, command, argument);
+}
+extern "C" int fcntl64(int fd, int command, ...) {
+  static auto* const meant = Meant<int(int, int, ...)>("fcntl64");
+  va_list arguments;
+  va_start(arguments, command);
+  void* const argument = va_arg(arguments, void*);
+  va_end(arguments);
+  return Fails("fcntl", EIO, __builtin_return_address(0)) ? -1 : meant(fd, command, argument);
+}
