@@ -28,19 +28,21 @@ TEST(GoodPackage, LibraryIsSignedThenThePackageThenItsKeyIsRegistered) {
 
   const Simulation run = Simulate(apk);
 
-  EXPECT_EQ(run.timeline, Timeline({Log(4, "VeltSignJni starts: 3.\n"),                          //
-                                    Log(4, "VeltSignOat: Apk case.\n"),                          //
-                                    Integrity("1f"),                                             //
-                                    Sign(4, library, PackagePayload()),                          //
-                                    Log(4, "VeltSignJni finished: 0.\n"),                        //
-                                    Log(4, "VeltSign starts: zip_fd = 3, fd = 3.\n"),            //
-                                    Log(4, "VeltSignOat: Apk case.\n"),                          //
-                                    Integrity("1f"),                                             //
-                                    Sign(3, apk, PackagePayload()),                              //
-                                    Log(4, "VeltSign finished: 0.\n"),                           //
-                                    Register(3, apk, "com.example.app", ModulusOf("rsa-2048")),  //
-                                    Log(4, "ZuAddCertificate: ZuNewCertificate return 0.\n"),    //
-                                    Exit(0)}));
+  EXPECT_EQ(run.timeline, Timeline({
+                              Log(4, "VeltSignJni starts: 3.\n"),
+                              Log(4, "VeltSignOat: Apk case.\n"),
+                              Integrity("1f"),
+                              Sign(4, library, PackagePayload()),
+                              Log(4, "VeltSignJni finished: 0.\n"),
+                              Log(4, "VeltSign starts: zip_fd = 3, fd = 3.\n"),
+                              Log(4, "VeltSignOat: Apk case.\n"),
+                              Integrity("1f"),
+                              Sign(3, apk, PackagePayload()),
+                              Log(4, "VeltSign finished: 0.\n"),
+                              Register(3, apk, "com.example.app", ModulusOf("rsa-2048")),
+                              Log(4, "ZuAddCertificate: ZuNewCertificate return 0.\n"),
+                              Exit(0),
+                          }));
   EXPECT_EQ(run.status, 0);
 }
 

@@ -39,5 +39,5 @@ std::string LibraryStep(std::initializer_list<std::string> libraries = {});
 std::string SignedLibrary(const std::string& path, const Bytes& payload = PackagePayload());
 // VeltSign of a package that is good.
 std::string PackageStep(const std::string& path, const Bytes& payload = PackagePayload());
-// VeltSignJni and VeltSign of a package that is not good, after which nothing follows.
+// VeltSignJni and VeltSign of a package that is not good.
 std::string NothingSigned(const std::string& path);
