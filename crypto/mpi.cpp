@@ -102,7 +102,7 @@ int mpi_from_bytes(mpi* X, const uint8_t* bytes, size_t len) {
 
 int mpi_to_bytes(const mpi* X, uint8_t* bytes, size_t len) {
   const int bits = mpi_msb(X);
-  const size_t used = static_cast<size_t>(bits / 8 + (bits % 8 != 0 ? 1 : 0));
+  const size_t used = (static_cast<size_t>(bits) + 7) / 8;
   if (used > len) return kMpiBufferTooSmall;
   for (size_t i = 0; i < len; ++i) {
     const uint32_t limb = i < used ? X->p[i / kLimbBytes] : 0;
@@ -476,7 +476,7 @@ void raise(mpi* X, const mpi* E, const mpi_local* W, int w, montgomery* m) {
   int nbits = 0;
   int wbits = 0;
   for (int i = mpi_msb(E) - 1; i >= 0; --i) {
-    const int bit = E->p[i / kLimbBits] >> (i % kLimbBits) & 1;
+    const int bit = static_cast<int>(E->p[i / kLimbBits] >> (i % kLimbBits) & 1);
     if (bit == 0 && nbits == 0) {
       m->multiply(X, X);
       continue;
