@@ -49,8 +49,9 @@ uint32_t ToUint32(const asn1_hdr& integer) {
 
 bool HoldsNul(const asn1_hdr& hdr) { return memchr(hdr.payload, 0, hdr.length) != nullptr; }
 
-// The parts of a certificate, in order. Each returns the result of x509_certificate_parse, or true
-// where a failure has one code only, which the caller gives.
+// The parts of a certificate, in order. Those that return an int give the codes of
+// x509_certificate_parse, unless they say otherwise; of those that return a bool the caller knows
+// the code.
 int ParseTbs(Range tbs, x509_certificate* cert);
 int ParseVersionAndSerial(Range* tbs, x509_certificate* cert);
 bool ParseAlgorithm(Range* range, asn1_oid* oid, asn1_oid* params);
