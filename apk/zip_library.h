@@ -16,6 +16,8 @@
 #include <utility>
 #include <vector>
 
+#include "util/file.h"
+
 struct ZipString;  // Defined by the older generation alone.
 
 namespace ApkTools {
@@ -24,6 +26,7 @@ namespace ApkTools {
 inline constexpr int32_t kZipEntryNotFound = -7;
 inline constexpr int32_t kZipInconsistentInformation = -9;
 inline constexpr int32_t kZipInvalidEntryName = -10;
+inline constexpr int32_t kZipAllocationFailed = -13;
 
 // The longest name that a zip archive, and a `ZipString`, can hold, in bytes.
 inline constexpr size_t kZipLongestName = 0xffff;
@@ -130,15 +133,17 @@ inline int32_t ProveZipLength(ZipArchiveHandle archive, ZipEntry* entry) {
   return ProcessZipEntryContents(archive, entry, keep_nothing, nullptr);
 }
 
-// Extracts the entry whole into `out`, which becomes as long as the entry. An entry that cannot be
-// as long as it says is refused with kZipInconsistentInformation and leaves `out` alone, as does
-// one above kZipTrustedLength whose data is not as long as it says.
+// Extracts the entry whole into `out`, which becomes as long as the entry. Three are refused and
+// leave `out` alone: an entry that cannot be as long as it says (kZipInconsistentInformation), and
+// above kZipTrustedLength one whose data is not as long as it says (the library's code) and one
+// that is longer than can be had in memory (kZipAllocationFailed).
 inline int32_t ExtractZipEntry(ZipArchiveHandle archive, ZipEntry* entry,
                                std::vector<uint8_t>& out) {
   if (!IsPlausibleLength(*entry)) return kZipInconsistentInformation;
   if (entry->uncompressed_length > kZipTrustedLength) {
     const int32_t result = ProveZipLength(archive, entry);
     if (result != 0) return result;
+    if (!FitsInMemory(entry->uncompressed_length)) return kZipAllocationFailed;
   }
   out.resize(entry->uncompressed_length);
   return ExtractToMemory(archive, entry, out.data(), static_cast<uint32_t>(out.size()));

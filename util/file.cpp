@@ -28,7 +28,6 @@ class ScopedFd {
 };
 
 ssize_t FindSize(int fd);
-bool FitsInMemory(size_t size);
 void ReadBytes(int fd, std::vector<uint8_t>& out);
 
 }  // namespace
@@ -53,6 +52,18 @@ bool ReadFile(const std::string& path, std::vector<uint8_t>& out) {
   return true;
 }
 
+bool FitsInMemory(size_t size) {
+  if (size == 0) return true;
+  const auto pages = static_cast<size_t>(sysconf(_SC_PHYS_PAGES));
+  const auto page_size = static_cast<size_t>(sysconf(_SC_PAGESIZE));
+  if (size / page_size >= pages) return false;
+  void* const trial =
+      mmap(nullptr, size, PROT_READ | PROT_WRITE, MAP_PRIVATE | MAP_ANONYMOUS, -1, 0);
+  if (trial == MAP_FAILED) return false;
+  munmap(trial, size);
+  return true;
+}
+
 std::string GetFilenameByFd(int fd) {
   const std::string link = "/proc/self/fd/" + std::to_string(fd);
   char path[4096] = {};
@@ -71,22 +82,6 @@ ssize_t FindSize(int fd) {
   const off_t size = lseek(fd, 0, SEEK_END);
   if (size < 0 || !FitsInMemory(static_cast<size_t>(size))) return kUnknownSize;
   return lseek(fd, 0, SEEK_SET) == 0 ? size : kUnknownSize;
-}
-
-// Whether a vector may grow to `size` bytes. The vector itself cannot be asked: it ends the process
-// where it cannot grow. A sparse file claims any size for nothing, and a kernel that promises more
-// memory than there is would end the process later, so the memory of the machine is the limit, and
-// the address space is tried.
-bool FitsInMemory(size_t size) {
-  if (size == 0) return true;
-  const auto pages = static_cast<size_t>(sysconf(_SC_PHYS_PAGES));
-  const auto page_size = static_cast<size_t>(sysconf(_SC_PAGESIZE));
-  if (size / page_size >= pages) return false;
-  void* const trial =
-      mmap(nullptr, size, PROT_READ | PROT_WRITE, MAP_PRIVATE | MAP_ANONYMOUS, -1, 0);
-  if (trial == MAP_FAILED) return false;
-  munmap(trial, size);
-  return true;
 }
 
 // Fills `out` from `fd`, as far as there is something to read.

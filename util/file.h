@@ -2,6 +2,7 @@
 // between calls; what is returned or filled belongs to the caller. ReadFile alone logs.
 #pragma once
 
+#include <cstddef>
 #include <cstdint>
 #include <string>
 #include <vector>
@@ -14,6 +15,12 @@
 // A file that gives fewer bytes than its size is still true; the rest of `out` is what growing it
 // made it: zeros where it was shorter before, what it held where it was not.
 bool ReadFile(const std::string& path, std::vector<uint8_t>& out);
+
+// Whether a vector may grow to `size` bytes. The vector itself cannot be asked: it ends the process
+// where it cannot grow. A sparse file and a zip bomb claim any size for nothing, and a kernel that
+// promises more memory than there is would end the process later, so the memory of the machine is
+// the limit, and the address space is tried.
+bool FitsInMemory(size_t size);
 
 // The path of the file that `fd` is open on, as the kernel tells it, cut to its first 4095 bytes;
 // empty when `fd` is not open or the kernel has no path to tell.
