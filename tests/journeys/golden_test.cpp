@@ -2,6 +2,7 @@
 #include <gtest/gtest.h>
 
 #include <cctype>
+#include <filesystem>
 #include <fstream>
 
 #include "journeys/simulation.h"
@@ -9,7 +10,9 @@
 
 namespace {
 
-std::string Golden(const std::string& name) { return std::string(GOLDEN_PACKAGES) + "/" + name; }
+std::string Golden(const std::string& name) {
+  return std::filesystem::canonical(GOLDEN_PACKAGES).string() + "/" + name;
+}
 
 Bytes ReadHex(const std::string& path) {
   std::ifstream file(path);
@@ -65,13 +68,41 @@ INSTANTIATE_TEST_SUITE_P(By, GoldenPackage,
                                          "openssl-cms-md5", "openssl-cms-keyid"),
                          TestName);
 
-// The text of the signature block, as openssl prints its structure.
-std::string BlockStructure(const std::string& name) {
-  const ProcessResult run = RunProcess(
-      {"sh", "-c", "unzip -p \"$0/base.apk\" META-INF/CERT.RSA | openssl asn1parse -inform DER",
-       Golden(name)});
+// What a command line says of the package, whose folder it gets as $0.
+std::string Told(const std::string& name, const std::string& command) {
+  const ProcessResult run = RunProcess({"sh", "-c", command, Golden(name)});
   EXPECT_EQ(run.status, 0) << run.errors;
   return run.output;
+}
+
+std::string Manifest(const std::string& name) {
+  return Told(name, "unzip -p \"$0/base.apk\" META-INF/MANIFEST.MF");
+}
+
+// The structure of the signature block, as openssl prints it.
+std::string BlockStructure(const std::string& name) {
+  return Told(name, "unzip -p \"$0/base.apk\" META-INF/CERT.RSA | openssl asn1parse -inform DER");
+}
+
+bool Contains(const std::string& text, const std::string& part) {
+  return text.find(part) != std::string::npos;
+}
+
+// The options that the packages were made with have had the effect that their names speak of.
+TEST(GoldenPackages, AreWhatTheirNamesSay) {
+  for (const char* name : {"apksigner-sha1-2048", "apksigner-sha1-4096"}) {
+    EXPECT_TRUE(Contains(Manifest(name), "\nSHA1-Digest: ")) << name;
+    EXPECT_FALSE(Contains(Manifest(name), "SHA-256-Digest: ")) << name;
+  }
+  for (const char* name : {"apksigner-sha256-2048", "apksigner-sha256-4096"}) {
+    EXPECT_TRUE(Contains(Manifest(name), "\nSHA-256-Digest: ")) << name;
+    EXPECT_FALSE(Contains(Manifest(name), "SHA1-Digest: ")) << name;
+  }
+  EXPECT_EQ(ReadHex(Golden("apksigner-sha256-2048/modulus")).size(), 256U);
+  EXPECT_EQ(ReadHex(Golden("apksigner-sha256-4096/modulus")).size(), 512U);
+  EXPECT_TRUE(Contains(BlockStructure("openssl-cms-sha1"), ":sha1\n"));
+  EXPECT_TRUE(Contains(BlockStructure("openssl-cms-md5"), ":md5\n"));
+  EXPECT_TRUE(Contains(BlockStructure("openssl-cms-sha512"), ":sha512\n"));
 }
 
 void ExpectRefusalAfter(const std::string& name, std::initializer_list<std::string> reasons) {
@@ -85,7 +116,7 @@ class BlockWithAttributes : public testing::TestWithParam<const char*> {};
 
 // The element after the attributes is taken for the signature, and no padding comes out of it.
 TEST_P(BlockWithAttributes, IsRefused) {
-  ASSERT_NE(BlockStructure(GetParam()).find(":messageDigest"), std::string::npos);
+  ASSERT_TRUE(Contains(BlockStructure(GetParam()), ":messageDigest"));
 
   ExpectRefusalAfter(GetParam(), {Log(6, "RSA could not verify data: 7\n"),
                                   Log(6, "file not verified: META-INF/CERT.SF\n")});
@@ -97,8 +128,6 @@ INSTANTIATE_TEST_SUITE_P(By, BlockWithAttributes,
                          TestName);
 
 TEST(RefusedGoldenPackage, SignedWithALongerDigestHasInvalidPadding) {
-  ASSERT_NE(BlockStructure("openssl-cms-sha512").find(":sha512"), std::string::npos);
-
   ExpectRefusalAfter("openssl-cms-sha512",
                      {Log(6, "Invalid padding in RSA"), Log(6, "RSA could not verify data: 7\n"),
                       Log(6, "file not verified: META-INF/CERT.SF\n")});
