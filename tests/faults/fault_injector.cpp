@@ -48,8 +48,10 @@ bool IsIn(const char* name, const void* address) {
 void AbortForString8(int, siginfo_t*, void* context) {
 #ifdef __x86_64__
   const auto at = static_cast<ucontext_t*>(context)->uc_mcontext.gregs[REG_RIP];
-  if (IsIn("/android/libutils.so", reinterpret_cast<void*>(at))) abort();
+#else
+  const auto at = static_cast<ucontext_t*>(context)->uc_mcontext.pc;
 #endif
+  if (IsIn("/android/libutils.so", reinterpret_cast<void*>(at))) abort();
   signal(SIGSEGV, SIG_DFL);
 }
 

@@ -72,7 +72,8 @@ class Installed {
     std::filesystem::remove(folder_ / "journal");
     phone_.journal = folder_ / "journal";
     Command command = {
-        {}, ToolPath(), file_, FAULT_INJECTOR ":" KERNEL_STAND_IN, PhoneToEnvironment(phone_), 20};
+        {}, TOOL_PATH, file_, FAULT_INJECTOR ":" KERNEL_STAND_IN, PhoneToEnvironment(phone_), 20};
+    if (*TOOL_RUNNER != '\0') command.runner = Split(TOOL_RUNNER, ' ');
     command.environment.push_back("APKTOOLKIT_FAULT=" + fault);
     command.environment.push_back("APKTOOLKIT_FAULT_REPORT=" + folder_ / "report");
     Outcome outcome;
