@@ -6,7 +6,7 @@
 #include <iostream>
 
 #include "simulator/options.h"
-#include "simulator/simulation.h"
+#include "simulator/simulator.h"
 #include "simulator/timeline.h"
 
 namespace {
@@ -19,16 +19,16 @@ int main(int argc, char** argv) {
   Options options;
   if (const auto status = ParseOptions(argc, argv, &options)) return *status;
 
-  Simulation simulation(options);
+  Simulator simulator(options);
   int status = kAllSigned;
   std::string error;
-  if (!simulation.Prepare(&error)) {
+  if (!simulator.Prepare(&error)) {
     std::cerr << "apktoolkit-sim: " << error << '\n';
     return kCannotSimulate;
   }
   for (const std::string& file : options.files) {
     Events events;
-    const bool ran = simulation.Run(file, &events, &error);
+    const bool ran = simulator.Run(file, &events, &error);
     const Verdict verdict = Judge(events);
     if (!ran) {
       std::cout.flush();
@@ -40,6 +40,6 @@ int main(int argc, char** argv) {
                               : verdict.reasons.empty() ? kAllSigned
                                                         : kRefused);
   }
-  if (options.json) std::cout << simulation.Journal();
+  if (options.json) std::cout << simulator.Journal();
   return status;
 }

@@ -71,14 +71,10 @@ void PrintTimeline(const std::string& file, const Events& events, const Verdict&
   } else {
     printer.Coloured(kRed, "REFUSED " + Printable(file) + ": " + Printable(verdict.reasons[0]));
   }
-  std::string directory;
+  const std::string directory = verdict.path.substr(0, verdict.path.rfind('/') + 1);
   int number = 0;
   for (auto event = events.begin(), next = event; event != events.end(); event = next) {
     next = std::find_if(event, events.end(), [event](const json& e) { return e != *event; });
-    if (event->value("event", "") == "start") {
-      const std::string path = TextOf(*event, "path");
-      directory = path.substr(0, path.rfind('/') + 1);
-    }
     if (!IsShown(*event)) continue;
     Line line = Describe(*event, directory);
     if (next - event > 1) line.text += " (" + std::to_string(next - event) + " times)";

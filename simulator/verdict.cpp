@@ -12,27 +12,31 @@ constexpr char kToolTag[] = "ApkToolkit";
 constexpr int kErrorPriority = 6;
 constexpr int kAlreadyRegistered = 0x10004;
 
-void JudgeSign(const json& event, const std::string& path, Verdict* verdict);
-void JudgeVerify(const json& event, const std::string& path, Verdict* verdict);
+void JudgeStart(const json& event, Verdict* verdict);
+void JudgeSign(const json& event, Verdict* verdict);
+void JudgeVerify(const json& event, Verdict* verdict);
 void JudgeRegister(const json& event, Verdict* verdict);
 void JudgeLog(const json& event, Verdict* verdict);
 void JudgeExit(const json& event, Verdict* verdict);
+
+// Who judges which event.
+constexpr struct {
+  const char* kind;
+  void (*judge)(const json& event, Verdict* verdict);
+} kJudges[] = {{"start", JudgeStart},       {"sign", JudgeSign}, {"verify", JudgeVerify},
+               {"register", JudgeRegister}, {"log", JudgeLog},   {"exit", JudgeExit}};
 
 }  // namespace
 
 Verdict Judge(const Events& events) {
   Verdict verdict;
-  std::string path;
   bool has_log = false;
   for (const json& event : events) {
     const std::string kind = TextOf(event, "event");
     has_log = has_log || kind == "log";
-    if (kind == "start") path = TextOf(event, "path");
-    if (kind == "sign") JudgeSign(event, path, &verdict);
-    if (kind == "verify") JudgeVerify(event, path, &verdict);
-    if (kind == "register") JudgeRegister(event, &verdict);
-    if (kind == "log") JudgeLog(event, &verdict);
-    if (kind == "exit") JudgeExit(event, &verdict);
+    for (const auto& row : kJudges) {
+      if (kind == row.kind) row.judge(event, &verdict);
+    }
   }
   if (verdict.reasons.empty() && verdict.own == Signed::kNot) {
     verdict.reasons.push_back(
@@ -61,12 +65,14 @@ std::string DescribeErrno(int64_t error) {
 
 namespace {
 
-void JudgeSign(const json& event, const std::string& path, Verdict* verdict) {
+void JudgeStart(const json& event, Verdict* verdict) { verdict->path = TextOf(event, "path"); }
+
+void JudgeSign(const json& event, Verdict* verdict) {
   const std::string signed_path = TextOf(event, "path");
   if (NumberOf(event, "result") != 0) {
     verdict->reasons.push_back("the kernel did not sign " + signed_path + " (" +
                                DescribeErrno(NumberOf(event, "errno")) + ")");
-  } else if (signed_path != path) {
+  } else if (signed_path != verdict->path) {
     ++verdict->libraries;
   } else {
     constexpr char kNoData[] = "0000";
@@ -77,8 +83,8 @@ void JudgeSign(const json& event, const std::string& path, Verdict* verdict) {
 
 // Only a plain JAR is verified. What the tool said before, about what it lacks of a package, is no
 // failure then: the kernel's own answer is what counts.
-void JudgeVerify(const json& event, const std::string& path, Verdict* verdict) {
-  if (TextOf(event, "path") != path) return;
+void JudgeVerify(const json& event, Verdict* verdict) {
+  if (TextOf(event, "path") != verdict->path) return;
   verdict->reasons.clear();
   if (NumberOf(event, "result") == 0) return;
   verdict->reasons.push_back("the kernel does not trust it (" +

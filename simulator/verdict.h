@@ -12,6 +12,7 @@ using Events = std::vector<nlohmann::json>;
 enum class Signed { kNot, kAsPackage, kAsJar };
 
 struct Verdict {
+  std::string path;           // of the file, absolute
   Signed own = Signed::kNot;  // the file itself
   int libraries = 0;          // how many other files were signed
   int keys = 0;               // how many keys were registered

@@ -1,4 +1,4 @@
-#include "simulator/simulation.h"
+#include "simulator/simulator.h"
 
 #include <fcntl.h>
 #include <signal.h>
@@ -52,17 +52,17 @@ std::string OwnDescriptorPath(int fd) {
 
 }  // namespace
 
-Simulation::Simulation(const Options& options)
+Simulator::Simulator(const Options& options)
     : options_(options),
       kernel_(ProgramDirectory() + "/../lib/apktoolkit/libapktoolkit_kernel.so"),
       signed_(options.state) {}
 
-Simulation::~Simulation() {
+Simulator::~Simulator() {
   if (journal_ >= 0) close(journal_);
   if (kernel_descriptor_ >= 0) close(kernel_descriptor_);
 }
 
-bool Simulation::Prepare(std::string* error) {
+bool Simulator::Prepare(std::string* error) {
   if (!OpenJournalFile() ||
       !Event("journal").Number("version", kJournalVersion).AppendTo(journal_)) {
     return Fail("cannot write the journal " + options_.journal + Because(), error);
@@ -76,7 +76,7 @@ bool Simulation::Prepare(std::string* error) {
   return signed_.Load() || Fail("cannot use the directory " + options_.state, error);
 }
 
-bool Simulation::Run(const std::string& file, Events* events, std::string* error) {
+bool Simulator::Run(const std::string& file, Events* events, std::string* error) {
   const size_t before = Journal().size();
   const std::string path = Resolved(file);
   const bool ended = RunTool(file, path, error);
@@ -89,7 +89,7 @@ bool Simulation::Run(const std::string& file, Events* events, std::string* error
   return RememberSigned(*events) || Fail("cannot write to " + options_.state, error);
 }
 
-std::string Simulation::Journal() const {
+std::string Simulator::Journal() const {
   std::string journal;
   char part[1 << 16];
   ssize_t length;
@@ -100,7 +100,7 @@ std::string Simulation::Journal() const {
 }
 
 // Opens the file that was asked for, or one without a name. Events are appended to either.
-bool Simulation::OpenJournalFile() {
+bool Simulator::OpenJournalFile() {
   constexpr int kFlags = O_RDWR | O_CREAT | O_TRUNC | O_APPEND | O_CLOEXEC;
   const std::string& path = options_.journal;
   journal_ = path.empty() ? memfd_create("journal", MFD_CLOEXEC) : open(path.c_str(), kFlags, 0666);
@@ -108,7 +108,7 @@ bool Simulation::OpenJournalFile() {
 }
 
 // Runs the tool between the events "start" and "exit".
-bool Simulation::RunTool(const std::string& file, const std::string& path, std::string* error) {
+bool Simulator::RunTool(const std::string& file, const std::string& path, std::string* error) {
   Event("start").Text("file", file).Text("path", path).AppendTo(journal_);
   const Command command = {
       options_.runner, options_.tool, file, PreloadName(), PhoneToEnvironment(PhoneFor(path)),
@@ -132,7 +132,7 @@ bool Simulation::RunTool(const std::string& file, const std::string& path, std::
 }
 
 // The phone as the run for the file at `path` finds it.
-Phone Simulation::PhoneFor(const std::string& path) const {
+Phone Simulator::PhoneFor(const std::string& path) const {
   Phone phone = options_.phone;
   phone.journal = OwnDescriptorPath(journal_);
   for (const std::string& trusted : options_.trust) AddId(trusted, &phone.trusted);
@@ -141,14 +141,14 @@ Phone Simulation::PhoneFor(const std::string& path) const {
 }
 
 // The loader takes spaces and colons for separators; a descriptor's path has none.
-std::string Simulation::PreloadName() {
+std::string Simulator::PreloadName() {
   if (kernel_.find_first_of(" :") == std::string::npos) return kernel_;
   if (kernel_descriptor_ < 0) kernel_descriptor_ = open(kernel_.c_str(), O_RDONLY | O_CLOEXEC);
   return OwnDescriptorPath(kernel_descriptor_);
 }
 
 // Lines that are no JSON are not ours and do not count.
-Events Simulation::EventsFrom(size_t offset) const {
+Events Simulator::EventsFrom(size_t offset) const {
   Events events;
   for (const std::string& line : Split(Journal().substr(offset), '\n')) {
     auto event = nlohmann::json::parse(line, nullptr, false);
@@ -157,7 +157,7 @@ Events Simulation::EventsFrom(size_t offset) const {
   return events;
 }
 
-bool Simulation::RememberSigned(const Events& events) {
+bool Simulator::RememberSigned(const Events& events) {
   bool kept = true;
   for (const auto& event : events) {
     const bool is_signed = TextOf(event, "event") == "sign" && NumberOf(event, "result") == 0;

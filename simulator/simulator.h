@@ -8,12 +8,12 @@
 #include "simulator/state.h"
 #include "simulator/verdict.h"
 
-class Simulation {
+class Simulator {
  public:
-  explicit Simulation(const Options& options);
-  ~Simulation();
-  Simulation(const Simulation&) = delete;
-  Simulation& operator=(const Simulation&) = delete;
+  explicit Simulator(const Options& options);
+  ~Simulator();
+  Simulator(const Simulator&) = delete;
+  Simulator& operator=(const Simulator&) = delete;
 
   // Opens the journal and the state and looks for the stand-ins. False, with `error` set to what
   // to tell the user, when the simulation cannot begin.
