@@ -34,8 +34,6 @@ struct ScopedRsaKey {
   ScopedRsaKey& operator=(const ScopedRsaKey&) = delete;
 };
 
-// What rsa_pkcs1_verify calls bad input.
-constexpr int kRsaBadInput = 5;
 // The longest modulus that becomes a manufacturer key, in bytes.
 constexpr uint32_t kLongestKey = 2047;
 
