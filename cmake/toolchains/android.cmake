@@ -11,6 +11,8 @@ if(NOT CMAKE_SYSROOT)
   message(FATAL_ERROR "The android preset needs -DCMAKE_SYSROOT=DIR, see docs/porting.md")
 endif()
 set(CMAKE_TRY_COMPILE_PLATFORM_VARIABLES CMAKE_SYSROOT)
+# A sysroot may have the libraries and not the objects that a program starts with.
+set(CMAKE_TRY_COMPILE_TARGET_TYPE STATIC_LIBRARY)
 
 if(NOT CMAKE_CXX_COMPILER)
   find_program(ANDROID_CLANG NAMES clang++ clang++-14 REQUIRED)
