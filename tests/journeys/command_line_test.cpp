@@ -60,7 +60,7 @@ std::vector<std::string> OnItsOwnFileSystem(const std::string& package,
                                             const std::string& options) {
   const std::string script =
       "mount -t tmpfs apktoolkit \"$0\" && cp \"$1\" \"$0/base.apk\" &&"
-      " mount -o remount," +
+      " mount -o remount,bind," +
       options + " \"$0\" && shift && exec \"$@\"";
   const char* const namespaces = geteuid() == 0 ? "-m" : "-Urm";
   return {"unshare", namespaces, "sh", "-c", script, mount_point, package};

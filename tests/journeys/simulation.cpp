@@ -60,7 +60,6 @@ bool Redirect(int number, const std::string& path, int flags) {
                      (directory.empty() || chdir(directory.c_str()) == 0);
   // What this process was started with, such as ctest's log, would move the command's own numbers.
   closefrom(STDERR_FILENO + 1);
-  closefrom(STDERR_FILENO + 1);  // what ctest leaves open would shift the tool's descriptors
   if (ready) execvp(arguments[0], arguments.data());
   perror(arguments[0]);
   _exit(127);
