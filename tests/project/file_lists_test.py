@@ -1,10 +1,25 @@
 #!/usr/bin/env python3
 """Holds the file lists of the Android.bp files against those of CMake, and both against the folders."""
 
+import pathlib
 import re
 import sys
 
-from sources import ROOT, report, tool_sources, without_comments
+from sources import ROOMS, ROOT, report, tool_sources, without_comments
+
+# What needs more than a phone has, and so is in the workstation's build alone.
+WORKSTATION_ONLY = {
+    "tests/apk/manifest_mf_test.cpp": "runs the JDK",
+    "tests/crypto/mpi_pow_mod_test.cpp": "compares with GMP",
+    "tests/crypto/mpi_test.cpp": "compares with GMP",
+    "tests/crypto/pkcs7_signer_test.cpp": "runs openssl",
+    "tests/crypto/rsa_test.cpp": "compares with GMP",
+    "tests/crypto/x509_authorities_test.cpp": "runs openssl",
+    "tests/util/digest_test.cpp": "runs coreutils",
+    "fuzz/integrity_fuzz.cpp": "has the linker wrap calls of the C library",
+    "fuzz/mpi_fuzz.cpp": "compares with GMP",
+    "fuzz/package_fuzz.cpp": "has the linker wrap a call of the zip library",
+}
 
 TOKEN = re.compile(r'"((?:[^"\\]|\\.)*)"|([A-Za-z_]\w*|\d+)|([{}\[\]:,=+])|(\S)')
 
@@ -57,12 +72,20 @@ class Blueprint:
         return sorted(str(folder / source) for source in found[0]["srcs"])
 
 
-def cmake_sources(target):
-    text = re.sub(r"#.*", "", (ROOT / "CMakeLists.txt").read_text())
-    found = re.search(r"add_(?:library|executable)\(%s\s+([^)]*)\)" % target, text)
+    def all_sources(self, kind):
+        folder = self.path.parent.relative_to(ROOT)
+        return [str(folder / source) for module in self.modules if module["type"] == kind
+                for source in module["srcs"]]
+
+
+def cmake_sources(target, folder="."):
+    path = ROOT / folder / "CMakeLists.txt"
+    found = re.search(r"(?:add_library|add_executable|apktoolkit_add_test)\(%s\s+([^)]*)\)" % target,
+                      re.sub(r"#.*", "", path.read_text()))
     if not found:
-        sys.exit(f"CMakeLists.txt has no target {target}")
-    return sorted(word for word in found[1].split() if word.endswith(".cpp"))
+        sys.exit(f"{path} has no target {target}")
+    return sorted(str(pathlib.Path(folder, word)) for word in found[1].split()
+                  if word.endswith(".cpp"))
 
 
 def compare(name, left, right, problems):
@@ -79,6 +102,21 @@ def main():
     compare("libzu", platform.sources("libzu"), cmake_sources("zu"), problems)
     listed = core + cmake_sources("apktoolkit") + cmake_sources("zu")
     compare("the tool's folders", listed, map(str, tool_sources()), problems)
+
+    tests = Blueprint(ROOT / "tests/Android.bp")
+    compare("apktoolkit_test_support", tests.sources("apktoolkit_test_support"),
+            cmake_sources("test_support", "tests/support"), problems)
+    both = [source for room in ROOMS for source in cmake_sources(f"{room}_test", f"tests/{room}")]
+    on_phone = tests.all_sources("cc_test")
+    fuzz = Blueprint(ROOT / "fuzz/Android.bp")
+    compare("apktoolkit_fuzz_support", fuzz.sources("apktoolkit_fuzz_support"),
+            cmake_sources("fuzz_support", "fuzz"), problems)
+    both += [str(path.relative_to(ROOT)) for path in (ROOT / "fuzz").glob("*_fuzz.cpp")]
+    on_phone += fuzz.all_sources("cc_fuzz")
+    shared = {"tests/support/phone.cpp", "fuzz/quiet_log.cpp"}
+    compare("tests and fuzz targets", set(on_phone) - shared | set(WORKSTATION_ONLY), both, problems)
+    problems += [f"{source} is in a module, and named as the workstation's own"
+                 for source in set(on_phone) & set(WORKSTATION_ONLY)]
     return report(problems)
 
 
