@@ -185,3 +185,12 @@ TEST(KernelStandIn, WritesNothingToTheStandardStreams) {
   EXPECT_EQ(result.output, "");
   EXPECT_EQ(result.errors, "");
 }
+
+TEST(KernelStandIn, LeavesErrnoAloneWhenTheJournalIsFull) {
+  const Probe probe({"sign 3 0000", "log-write 4 tag 61", "register 3 name ab",
+                     "fopen /proc/self/integrity/value r"});
+  RunProcess(
+      {"env", PRELOAD_KERNEL, "APKTOOLKIT_SIM_JOURNAL=/dev/full", PROBE_COMMAND, probe.path()});
+  EXPECT_EQ(LinesOf(ReadWhole(probe.path() + ".out")),
+            Lines({"fd 3", kSuccess, "1 77", kSuccess, "31 77"}));
+}
