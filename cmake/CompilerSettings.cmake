@@ -20,6 +20,9 @@ if(APKTOOLKIT_SANITIZE)
   add_compile_options(-fsanitize=${APKTOOLKIT_SANITIZE} -fno-sanitize-recover=all
     -fno-omit-frame-pointer)
   add_link_options(-fsanitize=${APKTOOLKIT_SANITIZE})
+  if(APKTOOLKIT_SANITIZE MATCHES unsigned-integer-overflow)
+    add_compile_options(-fsanitize-ignorelist=${PROJECT_SOURCE_DIR}/cmake/foreign_code.txt)
+  endif()
 endif()
 
 option(APKTOOLKIT_COVERAGE "Count the lines that run (scripts/coverage)" OFF)

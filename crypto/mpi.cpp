@@ -7,6 +7,8 @@
 #include <cstring>
 #include <utility>
 
+#include "crypto/wrapping.h"
+
 // Deliberate: limbs have 32 bits and no arithmetic on them is wider, on 64-bit processors too:
 // there is one way to compute, in half limbs, and it needs no double-width type of the compiler's.
 
@@ -149,7 +151,7 @@ int mpi_shift_l(mpi* X, int count) {
   return 0;
 }
 
-int mpi_add_abs(mpi* X, const mpi* A, const mpi* B) {
+WRAPS_ON_PURPOSE int mpi_add_abs(mpi* X, const mpi* A, const mpi* B) {
   if (X == B) std::swap(A, B);
   const int used = used_limbs(B);
   if (const int result = mpi_assign(X, A)) return result;
@@ -191,7 +193,8 @@ int mpi_mul_int(mpi* X, const mpi* A, unsigned int b) {
   return 0;
 }
 
-void mpi_mul_hlp(int count, const unsigned int* s, unsigned int* d, unsigned int b) {
+WRAPS_ON_PURPOSE void mpi_mul_hlp(int count, const unsigned int* s, unsigned int* d,
+                                  unsigned int b) {
   uint32_t c = 0;
   for (; count >= 16; count -= 16, s += 16, d += 16) c = multiply_add<16>(s, d, b, c);
   for (; count >= 8; count -= 8, s += 8, d += 8) c = multiply_add<8>(s, d, b, c);
@@ -215,7 +218,7 @@ int mpi_mod_mpi(mpi* R, const mpi* A, const mpi* B) {
   return mpi_assign(R, &X);
 }
 
-void mpi_montmul(mpi* A, const mpi* B, const mpi* N, unsigned int mm, mpi* T) {
+WRAPS_ON_PURPOSE void mpi_montmul(mpi* A, const mpi* B, const mpi* N, unsigned int mm, mpi* T) {
   clear_limbs(T);
   const int n = N->n;
   const int m = std::min(B->n, n);
@@ -303,7 +306,7 @@ int compare_limbs(int count, const uint32_t* a, const uint32_t* b) {
 }
 
 // Adds `count` limbs of s to d, which may be s; returns the carry.
-uint32_t add_limbs(int count, const uint32_t* s, uint32_t* d) {
+WRAPS_ON_PURPOSE uint32_t add_limbs(int count, const uint32_t* s, uint32_t* d) {
   uint32_t carry = 0;
   for (int i = 0; i < count; ++i) {
     const uint32_t addend = s[i];
@@ -317,7 +320,7 @@ uint32_t add_limbs(int count, const uint32_t* s, uint32_t* d) {
 }
 
 // Subtracts `count` limbs of s from d; returns the borrow.
-uint32_t subtract_limbs(int count, const uint32_t* s, uint32_t* d) {
+WRAPS_ON_PURPOSE uint32_t subtract_limbs(int count, const uint32_t* s, uint32_t* d) {
   uint32_t borrow = 0;
   for (int i = 0; i < count; ++i) {
     const uint32_t minuend = d[i] - borrow;
@@ -329,15 +332,17 @@ uint32_t subtract_limbs(int count, const uint32_t* s, uint32_t* d) {
 }
 
 // The same, and takes the borrow from the limbs of d above, one of which absorbs it.
-void subtract_with_borrow(int count, const uint32_t* s, uint32_t* d) {
+WRAPS_ON_PURPOSE void subtract_with_borrow(int count, const uint32_t* s, uint32_t* d) {
   uint32_t borrow = subtract_limbs(count, s, d);
   for (int i = count; borrow != 0; ++i) borrow = d[i]-- == 0;
 }
 
 // Adds s * b + c to d over `kCount` limbs, a power of two, without a loop; returns the carry.
 template <int kCount>
-__attribute__((always_inline)) inline uint32_t multiply_add(const uint32_t* s, uint32_t* d,
-                                                            uint32_t b, uint32_t c) {
+WRAPS_ON_PURPOSE __attribute__((always_inline)) inline uint32_t multiply_add(const uint32_t* s,
+                                                                             uint32_t* d,
+                                                                             uint32_t b,
+                                                                             uint32_t c) {
   if constexpr (kCount > 1) {
     constexpr int kHalf = kCount / 2;
     return multiply_add<kHalf>(s + kHalf, d + kHalf, b, multiply_add<kHalf>(s, d, b, c));
@@ -352,7 +357,7 @@ __attribute__((always_inline)) inline uint32_t multiply_add(const uint32_t* s, u
     uint32_t r1 = s1 * b1;
     r1 += rx >> 16;
     r1 += ry >> 16;
-    const auto add = [&r0, &r1 ](uint32_t addend) __attribute__((always_inline)) {
+    const auto add = [&r0, &r1 ](uint32_t addend) __attribute__((always_inline)) WRAPS_ON_PURPOSE {
       r0 += addend;
       r1 += r0 < addend;
     };
@@ -368,7 +373,7 @@ __attribute__((always_inline)) inline uint32_t multiply_add(const uint32_t* s, u
 // X = abs(X) mod abs(B) with the sign of X, for abs(X) >= abs(B) > 0. Long division by 32-bit
 // digits that leaves the remainder in place of the dividend; the quotient is not kept (Knuth, The
 // Art of Computer Programming, volume 2, 4.3.1, algorithm D).
-int reduce(mpi* X, const mpi* B) {
+WRAPS_ON_PURPOSE int reduce(mpi* X, const mpi* B) {
   mpi_local Y;
   mpi_local product;
   if (const int result = mpi_assign(&Y, B)) return result;
@@ -417,7 +422,7 @@ uint32_t estimate_digit(uint32_t high, uint32_t low, uint32_t d) {
 
 // Divides `rest`, which is below d, with the half limb `next` appended, by d. Returns the quotient
 // and leaves the remainder in `rest`.
-uint32_t half_digit(uint32_t* rest, uint32_t next, uint32_t d) {
+WRAPS_ON_PURPOSE uint32_t half_digit(uint32_t* rest, uint32_t next, uint32_t d) {
   const uint32_t d1 = d >> 16;
   const uint32_t d0 = d & 0xFFFF;
   uint32_t q = *rest / d1;
@@ -443,7 +448,7 @@ void shift_r(mpi* X, int count) {
 }
 
 // -1 / m0 mod 2^32 for an odd m0: its inverse modulo 2^4, then Newton steps that double the bits.
-uint32_t montgomery_constant(uint32_t m0) {
+WRAPS_ON_PURPOSE uint32_t montgomery_constant(uint32_t m0) {
   uint32_t x = m0 + ((m0 * 2 + 4) & 8);
   for (int bits = kLimbBits; bits >= 8; bits /= 2) x *= 2 - m0 * x;
   return 0 - x;

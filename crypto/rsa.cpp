@@ -3,6 +3,7 @@
 #include <cstddef>
 #include <cstring>
 
+#include "crypto/wrapping.h"
 #include "util/log.h"
 
 namespace {
@@ -78,7 +79,7 @@ namespace {
 
 // Stores the exponent as a signed 32-bit number. Deliberate: when there is no memory for it, it
 // stays empty and nobody is told; the key then verifies no signature, as its power is always 1.
-void set_exponent(mpi* E, uint32_t exponent_value) {
+WRAPS_ON_PURPOSE void set_exponent(mpi* E, uint32_t exponent_value) {
   if (exponent_value == 0 || mpi_grow(E, 1) != 0) return;
   const bool negative = exponent_value > INT32_MAX;
   E->p[0] = negative ? 0 - exponent_value : exponent_value;

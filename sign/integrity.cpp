@@ -18,8 +18,8 @@ constexpr size_t kPathSize = 256;
 
 bool MaySign(uint32_t integrity) {
   // Deliberate: a waiting read never ends with the value "not settled", yet the test refuses it
-  // together with 0 (the addition wraps), so that no change to the reader can let it through.
-  return integrity + 1 >= 2;
+  // together with 0, so that no change to the reader can let it through.
+  return integrity != 0 && integrity != kNotSettled;
 }
 
 bool FormatIntegrityPath(int pid, char (&path)[kPathSize]) {
