@@ -67,11 +67,13 @@ Words EnvironmentWith(const Words& assignments) {
   return environment;
 }
 
-// 0, or the errno that tells why there is no child.
+// 0, or the errno that tells why there is no child. It gets the standard streams alone: whatever
+// the caller has open, the tool's first file is descriptor 3, as on a phone.
 int Spawn(Words words, Words environment, pid_t* child) {
   posix_spawn_file_actions_t actions;
   posix_spawn_file_actions_init(&actions);
   posix_spawn_file_actions_addopen(&actions, STDOUT_FILENO, "/dev/null", O_WRONLY, 0);
+  posix_spawn_file_actions_addclosefrom_np(&actions, STDERR_FILENO + 1);
   const std::string program = words[0];
   const int error = posix_spawnp(child, program.c_str(), &actions, nullptr, Pointers(&words).data(),
                                  Pointers(&environment).data());

@@ -162,14 +162,14 @@ std::string ExplainPayload(const std::string& hex) {
 
 Line DescribeRegister(const json& event) {
   constexpr size_t kShownDigits = 32;
-  constexpr int64_t kAlreadyRegistered = 0x10004;
+  constexpr int64_t kSecondSuccess = 0x10004;
   const int64_t result = NumberOf(event, "result");
   const std::string data = TextOf(event, "data");
   const std::string rest = data.size() > kShownDigits ? "..." : "";
   return {
       "register", Printable(TextOf(event, "name")) + ": libzu answers " + std::to_string(result),
       "key: length " + std::to_string(data.size() / 2) + ", " + data.substr(0, kShownDigits) + rest,
-      result != 0 && result != kAlreadyRegistered};
+      result != 0 && result != kSecondSuccess};
 }
 
 Line DescribeExit(const json& event) {

@@ -10,7 +10,7 @@ using nlohmann::json;
 
 constexpr char kToolTag[] = "ApkToolkit";
 constexpr int kErrorPriority = 6;
-constexpr int kAlreadyRegistered = 0x10004;
+constexpr int kSecondSuccess = 0x10004;
 
 void JudgeStart(const json& event, Verdict* verdict);
 void JudgeSign(const json& event, Verdict* verdict);
@@ -93,7 +93,7 @@ void JudgeVerify(const json& event, Verdict* verdict) {
 
 void JudgeRegister(const json& event, Verdict* verdict) {
   const int64_t result = NumberOf(event, "result");
-  if (result == 0 || result == kAlreadyRegistered) {
+  if (result == 0 || result == kSecondSuccess) {
     ++verdict->keys;
   } else {
     verdict->reasons.push_back("libzu did not register " + TextOf(event, "name") + " (result " +

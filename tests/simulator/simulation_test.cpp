@@ -192,6 +192,18 @@ TEST(Simulation, RunnerGetsThePreloadForTheTool) {
   EXPECT_EQ(result.status, 0);
 }
 
+TEST(Simulation, HandsNoOpenFileOfTheCallersToTheTool) {
+  const Probe probe({"sign 3 0000"});
+  const ProcessResult result =
+      RunProcess({"bash", "-c", "exec 3</dev/null 7</dev/null; exec \"$@\"", "bash",
+                  SimulatorPath(), "--json", "--tool", PROBE_PATH, probe.path()});
+  // The probe opens its file first, as the tool does.
+  const std::vector<Json> events = OfKind(ParseJournal(result.output), "sign");
+  ASSERT_EQ(events.size(), 1U);
+  EXPECT_EQ(events[0]["path"], probe.path());
+  EXPECT_EQ(result.status, 0) << result.errors;
+}
+
 TEST(State, WhatWasSignedStaysTrustedWhileItsBytesStayTheSame) {
   const Folder state;
   const Probe jar({"verify 3", "sign 3 0000"});
