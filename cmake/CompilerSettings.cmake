@@ -8,8 +8,7 @@ set(CMAKE_EXPORT_COMPILE_COMMANDS ON)
 if(NOT CMAKE_BUILD_TYPE)
   set(CMAKE_BUILD_TYPE Release)
 endif()
-# A release has the same bytes wherever it was built (scripts/reproducible).
-set(CMAKE_CXX_FLAGS_RELEASE "-O2 -ffile-prefix-map=${PROJECT_SOURCE_DIR}=.")
+set(CMAKE_CXX_FLAGS_RELEASE "-O2")
 
 add_compile_options(-Wall -Wextra -Werror)
 set(APKTOOLKIT_TOOL_OPTIONS -fno-exceptions -fno-rtti -Wconversion)

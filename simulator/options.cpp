@@ -51,7 +51,8 @@ std::optional<int> ParseOptions(int argc, char** argv, Options* options) {
       ->capture_default_str();
   app.add_option("--runner", runner,
                  "Words to put before the tool: an emulator that takes -E NAME=VALUE")
-      ->type_name("COMMAND");
+      ->type_name("COMMAND")
+      ->take_last();
   app.add_option("FILE", options->files, "Packages, JARs or other files")
       ->type_name("")
       ->required();
