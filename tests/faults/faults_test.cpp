@@ -73,7 +73,7 @@ class Installed {
     phone_.journal = folder_ / "journal";
     Command command = {
         {}, TOOL_PATH, file_, FAULT_INJECTOR ":" KERNEL_STAND_IN, PhoneToEnvironment(phone_), 20};
-    if (*TOOL_RUNNER != '\0') command.runner = Split(TOOL_RUNNER, ' ');
+    if (AreProgramsEmulated()) command.runner = Split(APKTOOLKIT_RUNNER, ' ');
     command.environment.push_back("APKTOOLKIT_FAULT=" + fault);
     command.environment.push_back("APKTOOLKIT_FAULT_REPORT=" + folder_ / "report");
     Outcome outcome;

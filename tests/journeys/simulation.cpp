@@ -115,6 +115,8 @@ Simulation Simulate(const std::string& file, const std::vector<std::string>& opt
   return {run.status, TimelineOf(run.output)};
 }
 
+bool AreProgramsEmulated() { return *APKTOOLKIT_RUNNER != '\0'; }
+
 std::string ToolPath() { return APKTOOLKIT_PATH; }
 
 std::string SimulatorPath() { return APKTOOLKIT_SIM_PATH; }

@@ -53,6 +53,10 @@ struct Start {
 Simulation Simulate(const std::string& file, const std::vector<std::string>& options,
                     const Start& start);
 
+// Whether the built programs are for another processor and run under an emulator, which answers
+// some questions in the kernel's place.
+bool AreProgramsEmulated();
+
 // The built programs.
 std::string ToolPath();
 std::string SimulatorPath();

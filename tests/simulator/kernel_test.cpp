@@ -132,8 +132,10 @@ TEST(KernelFcntl, OtherCommandsGoToTheRealKernel) {
                           "fcntl64 3 " + std::to_string(F_DUPFD_CLOEXEC) + " 50",
                           "fcntl64 50 " + std::to_string(F_GETFD) + " 0"};
   const ProbeRun run = Probe(commands).Run();
+  // An emulator knows the commands itself, and looks at them first.
+  const std::string not_open = Refusal(AreProgramsEmulated() ? EINVAL : EBADF);
   EXPECT_EQ(run.results, Lines({Refusal(EINVAL), Refusal(EINVAL), Refusal(EINVAL), Refusal(EINVAL),
-                                Refusal(EBADF), "0 77", "40 77", "50 77", "1 77"}));
+                                not_open, "0 77", "40 77", "50 77", "1 77"}));
   EXPECT_EQ(run.events.size(), 1U);  // the exit
 }
 
@@ -152,6 +154,7 @@ TEST(KernelStandIn, KeepsItsDescriptorsHighAndToItself) {
 }
 
 TEST(KernelStandIn, WorksWithFewDescriptors) {
+  if (AreProgramsEmulated()) GTEST_SKIP() << "the emulator needs more";
   const Probe probe({"sign 3 0000", "register 3 name ab", "open /"});
   Lines command = {"sh", "-c", "ulimit -n 10 && exec \"$@\"", "sh"};
   for (const std::string& word : {SimulatorPath(), std::string("--json"), std::string("--tool"),

@@ -71,6 +71,7 @@ TEST(ExitStatus, ThreeWhenThereIsNoTool) {
 }
 
 TEST(ExitStatus, ThreeWhenTheToolIsNoProgram) {
+  if (AreProgramsEmulated()) GTEST_SKIP() << "the emulator starts, and not the tool";
   const Folder folder;
   const std::string tool = folder.Write("tool", ToBytes("\177ELF"));
   ASSERT_EQ(chmod(tool.c_str(), 0755), 0);
