@@ -1,0 +1,69 @@
+// bench_run ROUNDS PROGRAM... -- FILE: starts the programs with FILE in turns (A B C A B C ...), so
+// that whatever else the machine does meets them alike, and prints a line for each run:
+//
+//   PROGRAM <TAB> wall microseconds <TAB> cpu microseconds <TAB> peak resident kilobytes
+//
+// A small program of its own: the peak of a child counts from the memory of its parent.
+#include <fcntl.h>
+#include <spawn.h>
+#include <sys/resource.h>
+#include <sys/wait.h>
+#include <unistd.h>
+
+#include <cerrno>
+#include <cstdio>
+#include <cstdlib>
+#include <cstring>
+#include <ctime>
+
+namespace {
+
+long long Microseconds(const timeval& time) { return time.tv_sec * 1000000LL + time.tv_usec; }
+
+long long Now() {
+  timespec now;
+  clock_gettime(CLOCK_MONOTONIC, &now);
+  return now.tv_sec * 1000000LL + now.tv_nsec / 1000;
+}
+
+void Fail(const char* what) {
+  fprintf(stderr, "bench_run: %s: %s\n", what, strerror(errno));
+  exit(1);
+}
+
+// The output of the program goes to /dev/null.
+void Run(char* program, char* file, const posix_spawn_file_actions_t* silent) {
+  char* arguments[] = {program, file, nullptr};
+  const long long start = Now();
+  pid_t pid;
+  errno = posix_spawn(&pid, program, silent, nullptr, arguments, environ);
+  if (errno != 0) Fail(program);
+  int status;
+  rusage usage;
+  if (wait4(pid, &status, 0, &usage) != pid) Fail("wait4");
+  const long long wall = Now() - start;
+  if (status != 0) {
+    fprintf(stderr, "bench_run: %s failed with status %x\n", program, status);
+    exit(1);
+  }
+  printf("%s\t%lld\t%lld\t%ld\n", program, wall,
+         Microseconds(usage.ru_utime) + Microseconds(usage.ru_stime), usage.ru_maxrss);
+}
+
+}  // namespace
+
+int main(int argc, char** argv) {
+  if (argc < 5 || strcmp(argv[argc - 2], "--") != 0) {
+    fprintf(stderr, "usage: bench_run ROUNDS PROGRAM... -- FILE\n");
+    return 1;
+  }
+  posix_spawn_file_actions_t silent;
+  posix_spawn_file_actions_init(&silent);
+  posix_spawn_file_actions_addopen(&silent, STDOUT_FILENO, "/dev/null", O_WRONLY, 0);
+  posix_spawn_file_actions_addopen(&silent, STDERR_FILENO, "/dev/null", O_WRONLY, 0);
+  const int rounds = atoi(argv[1]);
+  for (int round = 0; round < rounds; ++round) {
+    for (int i = 2; i < argc - 2; ++i) Run(argv[i], argv[argc - 1], &silent);
+  }
+  return 0;
+}
