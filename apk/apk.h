@@ -9,11 +9,10 @@
 #include <ziparchive/zip_archive.h>
 
 #include <cstdint>
-#include <map>
 #include <string>
-#include <utility>
 #include <vector>
 
+#include "apk/entry_digests.h"
 #include "apk/manifest_mf.h"
 
 namespace ApkTools {
@@ -100,14 +99,10 @@ class Apk {
   bool CanSkipValidation(const std::string& name);
 
  private:
-  // For an entry's name, its digest attribute's name and value (base64).
-  using EntryDigests = std::map<std::string, std::pair<std::string, std::string>>;
-
   bool FindFile(const char* path);
   bool OpenZip(bool own_fd);
   int32_t ExtractEntry(const std::string& name, std::vector<uint8_t>& out);
   bool VerifyPackage(const std::vector<uint8_t>& android_manifest);
-  static EntryDigests CollectDigests(const std::vector<ManifestMf::Section>& sections);
   bool ExtractSignatureFile(std::string& name, std::vector<uint8_t>& content);
   bool VerifyDex();
   template <typename ReadContent>
@@ -120,7 +115,7 @@ class Apk {
   bool is_good_apk_ = false;
   bool dex_checked_ = false;
   bool is_good_zip_ = false;
-  EntryDigests entry_digests_;
+  EntryDigests entry_digests_;  // of manifest_mf_
   ManifestMf manifest_mf_;
   ManifestMf cert_sf_;
   std::vector<uint8_t> manufacturer_key_;

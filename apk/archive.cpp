@@ -3,12 +3,12 @@
 
 #include <cerrno>
 #include <cstring>
+#include <utility>
 
 #include "apk/apk.h"
 #include "apk/zip_library.h"
 #include "util/file.h"
 #include "util/log.h"
-#include "util/text.h"
 
 namespace ApkTools {
 
@@ -82,43 +82,27 @@ int32_t Apk::ExtractEntry(const std::string& name, std::vector<uint8_t>& out) {
 bool Apk::VerifyPackage(const std::vector<uint8_t>& android_manifest) {
   std::vector<uint8_t> manifest;
   if (ExtractEntry(kMANIFEST_MF, manifest) != 0) return false;
-  const std::string manifest_text(manifest.begin(), manifest.end());
 
   if (!InitCertSf()) return false;
   if (!ValidateManifest(manifest)) {
     LogError("Can't validate manifest.\n");
     return false;
   }
-  if (!manifest_mf_.load(manifest_text)) {
-    LogError("Can't load manifest: size=%zu\n", manifest_text.size());
+  const size_t size = manifest.size();
+  ManifestMf manifest_mf;
+  EntryDigests entry_digests;
+  if (!entry_digests.Load(std::move(manifest), manifest_mf)) {
+    LogError("Can't load manifest: size=%zu\n", size);
     return false;
   }
   if (!ParseAndroidManifest(android_manifest)) {
     LogError("Can't process Android Manifest.\n");
     return false;
   }
-  entry_digests_ = CollectDigests(manifest_mf_.getSections());
+  // The one points into the other: they change together or not at all.
+  manifest_mf_ = std::move(manifest_mf);
+  entry_digests_ = std::move(entry_digests);
   return true;
-}
-
-Apk::EntryDigests Apk::CollectDigests(const std::vector<ManifestMf::Section>& sections) {
-  EntryDigests digests;
-  for (const ManifestMf::Section& section : sections) {
-    std::string entry_name, digest_name, digest;
-    for (const auto& [name, value] : section) {
-      if (name == "Name") entry_name = value;
-      // Deliberate: of several digests the last in the order of names counts, so that "SHA1-Digest"
-      // goes before "SHA-256-Digest". The signature file's are chosen in the same way.
-      if (EndsWith(name, "-Digest")) {
-        digest_name = name;
-        digest = value;
-      }
-    }
-    // The main section, which names no entry, is left out here as well.
-    if (entry_name.empty() || digest_name.empty() || digest.empty()) continue;
-    digests[entry_name] = {digest_name, digest};
-  }
-  return digests;
 }
 
 int32_t Apk::StartIteration(void** cookie, const std::string& prefix, const std::string& suffix) {

@@ -44,13 +44,12 @@ bool Apk::VerifyFileHash(const std::string& name, const std::string& path) {
 // manifest does not list.
 template <typename ReadContent>
 bool Apk::VerifyContent(const std::string& name, ReadContent read_content) {
-  const auto recorded = entry_digests_.find(name);
-  if (recorded == entry_digests_.end()) {
+  std::string digest_name, digest;
+  if (!entry_digests_.Find(manifest_mf_, name, digest_name, digest)) {
     if (CanSkipValidation(name)) return true;
     LogError("Can't find file in %s: %s\n", kMANIFEST_MF, name.c_str());
     return false;
   }
-  const auto& [digest_name, digest] = recorded->second;
   const std::vector<uint8_t> expected = Base64Decode(digest);
   std::vector<uint8_t> content;
   return read_content(content) && VerifyData(digest_name, expected, content);

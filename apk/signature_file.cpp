@@ -4,6 +4,7 @@
 
 #include <cstring>
 #include <string_view>
+#include <utility>
 
 #include "apk/apk.h"
 #include "apk/base64.h"
@@ -43,7 +44,11 @@ bool Apk::InitCertSf() {
   std::string name;
   std::vector<uint8_t> content;
   if (!ExtractSignatureFile(name, content)) return false;
-  if (!cert_sf_.load(std::string(content.begin(), content.end()))) return false;
+  std::vector<uint8_t> sha1, sha256, md5;
+  ComputeSHA1Digest(content, sha1);
+  ComputeSHA256Digest(content, sha256);
+  ComputeMD5Digest(content, md5);
+  if (!cert_sf_.load(std::move(content))) return false;
 
   const std::string block_name = SignatureBlockName(name);
   std::vector<uint8_t> block;
@@ -51,11 +56,6 @@ bool Apk::InitCertSf() {
     LogError("Can't extract RSA certificate: %s\n", block_name.c_str());
     return false;
   }
-
-  std::vector<uint8_t> sha1, sha256, md5;
-  ComputeSHA1Digest(content, sha1);
-  ComputeSHA256Digest(content, sha256);
-  ComputeMD5Digest(content, md5);
   if (!VerifyCertificate(block, sha1, sha256, md5, manufacturer_key_)) {
     LogError("file not verified: %s\n", name.c_str());
     return false;
@@ -188,7 +188,7 @@ bool FindManifestDigest(const ManifestMf::Section& section, std::string& digest_
   for (const auto& [name, value] : section) {
     if (!EndsWith(name, kDigestManifest)) continue;
     digest_name = name.substr(0, name.size() - kManifest.size());
-    expected = Base64Decode(value);
+    expected = Base64Decode(std::string(value));
     found = true;
   }
   return found;

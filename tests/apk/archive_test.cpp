@@ -236,6 +236,22 @@ TEST(ApkInit, ASecondInitForgetsTheFirstOnesDigests) {
   EXPECT_FALSE(open.apk.VerifyFileHash("lib/only.so", disk.path()));
 }
 
+// The road of the second package ends where its manifest has been read already.
+TEST(ApkInit, ASecondInitThatFailsKeepsTheFirstOnesDigests) {
+  PackageOptions first = WithoutDex();
+  first.entries.push_back({"lib/only.so", ToBytes("only")});
+  OpenPackage open(first);
+  DiskFile disk(ToBytes("only"));
+
+  PackageOptions bad = WithoutDex();
+  bad.android_manifest = ToBytes("no compiled manifest");
+  MemoryFile second(SignPackage(bad).Build());
+  LogCapture log;
+  open.apk.Init(second.fd(), nullptr);
+  ASSERT_EQ(log.records().back(), Error("Can't process Android Manifest.\n"));
+  EXPECT_TRUE(open.apk.VerifyFileHash("lib/only.so", disk.path()));
+}
+
 // ---- The road of a package, step by step.
 
 TEST(ApkInit, APackageWithoutManifestIsNotGoodAndSaysNothing) {
