@@ -1,6 +1,7 @@
 #include "apk/manifest_mf.h"
 
 #include <algorithm>
+#include <cstring>
 #include <functional>
 
 #include "util/log.h"
@@ -10,6 +11,20 @@ namespace {
 bool IsLineBreak(char c) { return c == '\r' || c == '\n'; }
 
 bool EndsLine(uint8_t byte) { return byte == '\r' || byte == '\n' || byte == '\0'; }
+
+constexpr uint8_t kGreatestLineEnd = '\r';
+
+// Whether each of the eight bytes is above all that end a line.
+bool IsPlainText(const uint8_t* eight) {
+  constexpr uint64_t kEachByte = 0x0101010101010101;
+  constexpr uint64_t kHighBits = 0x80 * kEachByte;
+  constexpr uint64_t kLeastPlain = (kGreatestLineEnd + 1) * kEachByte;
+  uint64_t bytes;
+  memcpy(&bytes, eight, sizeof(bytes));
+  // With its high bit set no byte borrows from the next, and it keeps that bit when its other bits
+  // are not below the least.
+  return ((((bytes | kHighBits) - kLeastPlain) | bytes) & kHighBits) == kHighBits;
+}
 
 }  // namespace
 
@@ -133,7 +148,11 @@ std::string_view ManifestMf::readLine(Progress& at) const {
   const size_t size = text_.size();
   const uint8_t* const text = text_.data();
   size_t end = start;
-  while (end < size && !EndsLine(text[end])) ++end;
+  for (;; ++end) {
+    while (size - end >= 8 && IsPlainText(text + end)) end += 8;
+    while (end < size && text[end] > kGreatestLineEnd) ++end;
+    if (end == size || EndsLine(text[end])) break;
+  }
   at.cursor = end;
   at.state = P_EOL;
   return view(start, end);

@@ -286,6 +286,25 @@ TEST(ManifestMf, EveryKindOfLineBreakEndsLinesAndSections) {
   }
 }
 
+// Wherever in a line of whatever length a byte stands, it ends the line or it does not.
+TEST(ManifestMf, OnlyCrLfAndNulEndALine) {
+  for (size_t length = 1; length <= 24; ++length) {
+    for (size_t at = 0; at < length; ++at) {
+      for (int byte = 0; byte < 256; ++byte) {
+        std::string value(length, '\xFE');
+        value[at] = static_cast<char>(byte);
+        if (byte == '\0' || byte == '\r' || byte == '\n') value.insert(at + 1, 1, ' ');
+        std::string joined(length, '\xFE');
+        joined[at] = static_cast<char>(byte);
+        if (value != joined) joined.erase(at, 1);
+        const Sections expected = joined.empty() ? Sections({{}}) : Sections({{{"A", joined}}});
+        ASSERT_EQ(expected, Parse("A: " + value + "\r\n\r\n"))
+            << length << " " << at << " " << byte;
+      }
+    }
+  }
+}
+
 TEST(ManifestMf, LineFeedAndCrLfAfterAValueAreALineBreakAndAnEmptyLine) {
   EXPECT_EQ(Sections({{{"A", "1"}}, {{"B", "2"}}}), Parse("A: 1\n\r\nB: 2\n\r\n"));
 }
