@@ -23,8 +23,10 @@ bool Equals(const String8& string, std::string_view text);
 }  // namespace
 
 bool Apk::ParseAndroidManifest(const std::vector<uint8_t>& bytes) {
+  // The parser reads the document's header without asking whether there is room for one.
+  const bool has_header = bytes.size() >= sizeof(android::ResXMLTree_header);
   android::ResXMLTree parser;
-  parser.setTo(bytes.data(), bytes.size(), false);
+  parser.setTo(bytes.data(), has_header ? bytes.size() : 0, false);
   if (const android::status_t error = parser.getError(); error != 0) {
     LogError("%s failed to init xml parser, error=0x%08x\n", "ParseAndroidManifest",
              static_cast<unsigned>(error));

@@ -159,6 +159,7 @@ void MakeCompiledManifests() {
         .EndNamespace("android", kAndroidNamespace);
     Seed("compiled_manifest", pool == CompiledXml::Pool::kUtf8 ? "utf-8" : "utf-16", xml.Build());
   }
+  Seed("compiled_manifest", "no-header", {3});
   Seed("compiled_manifest", "bad-node", CompiledXml().Start("manifest").BadNode().Build());
 }
 

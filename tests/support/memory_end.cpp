@@ -1,0 +1,58 @@
+#include "support/memory_end.h"
+
+#include <sys/mman.h>
+#include <unistd.h>
+
+#include <cstdio>
+#include <cstdlib>
+#include <new>
+
+namespace {
+
+constexpr size_t kRoom = 1 << 20;
+
+// kRoom bytes before it are for the block.
+uint8_t* memory_end = nullptr;
+// The size of the block that the next operator new of that size is to put there; 0: none.
+size_t size_at_end = 0;
+
+void MakeMemory() {
+  const auto page = static_cast<size_t>(sysconf(_SC_PAGESIZE));
+  void* const room =
+      mmap(nullptr, kRoom + page, PROT_READ | PROT_WRITE, MAP_PRIVATE | MAP_ANONYMOUS, -1, 0);
+  memory_end = static_cast<uint8_t*>(room) + kRoom;
+  if (room == MAP_FAILED || mprotect(memory_end, page, PROT_NONE) != 0) {
+    perror("memory");
+    abort();
+  }
+}
+
+bool IsAtEnd(const void* block) {
+  return memory_end != nullptr && block >= memory_end - kRoom && block < memory_end;
+}
+
+}  // namespace
+
+std::vector<uint8_t> AtMemoryEnd(const uint8_t* data, size_t size) {
+  if (size > kRoom) abort();
+  if (memory_end == nullptr) MakeMemory();
+  size_at_end = size;
+  std::vector<uint8_t> copy(data, data + size);
+  size_at_end = 0;
+  return copy;
+}
+
+void* operator new(size_t size) {
+  if (size_at_end != 0 && size == size_at_end) {
+    size_at_end = 0;
+    return memory_end - (size + 3) / 4 * 4;
+  }
+  void* const block = malloc(size == 0 ? 1 : size);
+  if (block == nullptr) abort();
+  return block;
+}
+void* operator new(size_t size, const std::nothrow_t&) noexcept { return malloc(size); }
+void operator delete(void* block) noexcept {
+  if (!IsAtEnd(block)) free(block);
+}
+void operator delete(void* block, size_t) noexcept { operator delete(block); }
