@@ -106,7 +106,8 @@ class Apk {
   bool ExtractSignatureFile(std::string& name, std::vector<uint8_t>& content);
   bool VerifyDex();
   template <typename ReadContent>
-  bool VerifyContent(const std::string& name, ReadContent read_content);
+  bool VerifyContent(const std::string& name, const std::vector<uint8_t>& content,
+                     ReadContent read_content);
 
   std::string path_;
   int fd_ = -1;
@@ -121,6 +122,7 @@ class Apk {
   std::vector<uint8_t> manufacturer_key_;
   bool ss_permission_required_ = false;
   std::string package_name_;
+  std::vector<uint8_t> file_content_;  // of VerifyFileHash; kept from one file to the next
 };
 
 }  // namespace ApkTools

@@ -1,4 +1,5 @@
 // Single entries and files against the digests that the manifest records for them.
+#include <algorithm>
 #include <set>
 
 #include "apk/apk.h"
@@ -30,20 +31,26 @@ bool Apk::VerifyDex() {
 }
 
 bool Apk::VerifyEntryHash(const std::string& name, ZipEntry& entry) {
-  return VerifyContent(name, [&](std::vector<uint8_t>& content) {
-    return ExtractZipEntry(zip_handle_, &entry, content) == 0;
-  });
+  std::vector<uint8_t> content;
+  return VerifyContent(name, content,
+                       [&] { return ExtractZipEntry(zip_handle_, &entry, content) == 0; });
 }
 
 bool Apk::VerifyFileHash(const std::string& name, const std::string& path) {
-  return VerifyContent(name,
-                       [&](std::vector<uint8_t>& content) { return ReadFile(path, content); });
+  return VerifyContent(name, file_content_, [&] {
+    size_t length;
+    if (!ReadFile(path, file_content_, length)) return false;
+    // A file that shrinks meanwhile must not end in what the file before it held.
+    std::fill(file_content_.begin() + static_cast<ptrdiff_t>(length), file_content_.end(), 0);
+    return true;
+  });
 }
 
-// `read_content` fills a vector, and answers whether it could; it is not called for a name that the
-// manifest does not list.
+// `read_content` fills `content`, and answers whether it could; it is not called for a name that
+// the manifest does not list.
 template <typename ReadContent>
-bool Apk::VerifyContent(const std::string& name, ReadContent read_content) {
+bool Apk::VerifyContent(const std::string& name, const std::vector<uint8_t>& content,
+                        ReadContent read_content) {
   std::string digest_name, digest;
   if (!entry_digests_.Find(manifest_mf_, name, digest_name, digest)) {
     if (CanSkipValidation(name)) return true;
@@ -51,8 +58,7 @@ bool Apk::VerifyContent(const std::string& name, ReadContent read_content) {
     return false;
   }
   const std::vector<uint8_t> expected = Base64Decode(digest);
-  std::vector<uint8_t> content;
-  return read_content(content) && VerifyData(digest_name, expected, content);
+  return read_content() && VerifyData(digest_name, expected, content);
 }
 
 bool Apk::CanSkipValidation(const std::string& name) {

@@ -15,6 +15,8 @@
 // A file that gives fewer bytes than its size is still true; the rest of `out` is what growing it
 // made it: zeros where it was shorter before, what it held where it was not.
 bool ReadFile(const std::string& path, std::vector<uint8_t>& out);
+// The same, and tells in `length` how many bytes the file gave.
+bool ReadFile(const std::string& path, std::vector<uint8_t>& out, size_t& length);
 
 // Whether a vector may grow to `size` bytes. The vector itself cannot be asked: it ends the process
 // where it cannot grow. A sparse file and a zip bomb claim any size for nothing, and a kernel that

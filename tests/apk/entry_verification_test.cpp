@@ -3,6 +3,7 @@
 #include <unistd.h>
 
 #include <algorithm>
+#include <functional>
 
 #include "apk/open_package.h"
 #include "apk/zip_library.h"
@@ -10,6 +11,16 @@
 #include "support/log_capture.h"
 
 using ApkTools::Apk;
+
+// The linker sends the tool's calls of read here.
+static std::function<void()> before_read;
+
+extern "C" ssize_t __real_read(int fd, void* buffer, size_t size);
+
+extern "C" ssize_t __wrap_read(int fd, void* buffer, size_t size) {
+  if (before_read) before_read();
+  return __real_read(fd, buffer, size);
+}
 
 namespace {
 
@@ -283,6 +294,24 @@ TEST(VerifyFileHash, AFileThatCannotBeReadIsReported) {
   LogCapture log;
   EXPECT_FALSE(open.apk.VerifyFileHash(kLibrary, "/nowhere/libfoo.so"));
   EXPECT_EQ(log.records(), Records({Error("Can't open file: /nowhere/libfoo.so\n")}));
+}
+
+// What is cut off counts as zeros, whatever the file before it held there.
+TEST(VerifyFileHash, AFileThatShrinksMeanwhileEndsInZeros) {
+  PackageOptions options;
+  options.entries = {{"first", ToBytes("the first file")},
+                     {"second", ToBytes("A second file")},
+                     {"zeros", ToBytes(std::string("A") + std::string(12, '\0'))}};
+  OpenPackage open(options);
+  DiskFile file("A second file");
+  ASSERT_TRUE(open.apk.VerifyFileHash("second", file.path()));
+  EXPECT_FALSE(open.apk.VerifyFileHash("zeros", file.path()));
+
+  before_read = [&] { EXPECT_EQ(0, truncate(file.path().c_str(), 1)); };
+  EXPECT_FALSE(open.apk.VerifyFileHash("second", file.path()));
+  WriteFile(file.path(), ToBytes("A second file"));
+  EXPECT_TRUE(open.apk.VerifyFileHash("zeros", file.path()));
+  before_read = nullptr;
 }
 
 TEST(VerifyFileHash, AFileListedWithMd5AloneIsUnsupported) {
