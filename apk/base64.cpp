@@ -46,7 +46,7 @@ int base64decode(const char* in, size_t length, uint8_t* out, size_t* out_length
     if (meaning == kSkip) continue;
     if (meaning == kEnd) break;
     if (meaning == kInvalid) return 1;
-    accumulator = accumulator * 64 + meaning;
+    accumulator = (accumulator << 6) | meaning;
     if (++collected < 4) continue;
     if (room - written < 3) return 1;
     out[written++] = static_cast<uint8_t>(accumulator >> 16);

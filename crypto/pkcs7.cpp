@@ -7,6 +7,7 @@
 #include <cstring>
 
 #include "crypto/asn1.h"
+#include "crypto/wrapping.h"
 #include "crypto/x509.h"
 
 namespace {
@@ -78,7 +79,7 @@ bool Block::ReadInside(size_t offset, size_t end, asn1_hdr* hdr) const {
 // Goes from the start of the block to the [0] of its certificates, whose header it leaves in `hdr`.
 // Deliberate: no label is looked at, and each length is compared with the whole block's, from
 // wherever the element is.
-bool ReadHeaders(const Block& block, asn1_hdr* hdr) {
+WRAPS_ON_PURPOSE bool ReadHeaders(const Block& block, asn1_hdr* hdr) {
   if (!block.Read(0, block.length, hdr) || !block.Read(block.Enter(*hdr), block.length, hdr)) {
     return Fail("CANT PROCESS CERTIFICATE TAG");
   }

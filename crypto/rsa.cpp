@@ -57,7 +57,7 @@ int rsa_pkcs1_verify(const rsa_context* ctx, const uint8_t* sha1, const uint8_t*
                      const uint8_t* md5, const uint8_t* sig) {
   if (ctx == nullptr || sha1 == nullptr || sig == nullptr) return kRsaBadInput;
   const uint32_t len = static_cast<uint32_t>(ctx->len);
-  if (len - kMinModulusSize > kMaxModulusSize - kMinModulusSize) return kRsaBadInput;
+  if (len < kMinModulusSize || len > kMaxModulusSize) return kRsaBadInput;
   uint8_t em[kMaxModulusSize];
   if (const int result = public_operation(ctx, sig, em)) return result;
 
