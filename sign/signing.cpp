@@ -129,7 +129,9 @@ std::string InstalledLibraryPath(const std::string& package_path, const std::str
     // Deliberate: plain prefixes. No "/" has to follow, so "lib/armeabiX/a.so" is looked for in
     // "lib/armX/"; the digest check that follows decides all the same.
     if (entry_name.compare(0, prefix_length, row.entry_prefix) != 0) continue;
-    const std::string directory = package_path.substr(0, package_path.rfind('/') + 1);
+    const size_t slash = package_path.rfind('/');
+    const std::string directory =
+        slash == std::string::npos ? "" : package_path.substr(0, slash + 1);
     return directory + row.installed + entry_name.substr(prefix_length);
   }
   return {};
