@@ -71,19 +71,6 @@ std::vector<std::string> NamesIn(Apk& apk, const std::string& prefix, const std:
   return names;
 }
 
-// A file on disk for the length of a test.
-class DiskFile {
- public:
-  explicit DiskFile(const Bytes& content) : path_(testing::TempDir() + "archive_test.apk") {
-    WriteFile(path_, content);
-  }
-  ~DiskFile() { unlink(path_.c_str()); }
-  const char* path() const { return path_.c_str(); }
-
- private:
-  std::string path_;
-};
-
 // ---- The flags after Init: one test for each row of how far it can get.
 
 TEST(ApkInit, WithoutDescriptorAndPathAllFlagsAreFalse) {
@@ -156,7 +143,7 @@ TEST(ApkInit, WithAPathAloneTheFileIsOpened) {
   Apk apk(-1);
   log.Clear();
   DiskFile file(SignPackage(WithoutDex()).Build());
-  apk.Init(-1, file.path());
+  apk.Init(-1, file.path().c_str());
   EXPECT_EQ(log.records(), Records());
   EXPECT_EQ(apk.GetPath(), file.path());
   EXPECT_GT(apk.GetFd(), 0);
@@ -182,11 +169,10 @@ TEST(ApkInit, DescriptorZeroFromItsOwnOpenCountsAsAFailure) {
   const int standard_input = dup(0);
   close(0);
   errno = 0;
-  apk.Init(-1, file.path());
+  apk.Init(-1, file.path().c_str());
   dup2(standard_input, 0);
   close(standard_input);
-  EXPECT_EQ(log.records(),
-            Records({Error(std::string("open('") + file.path() + "') failed: Success\n")}));
+  EXPECT_EQ(log.records(), Records({Error("open('" + file.path() + "') failed: Success\n")}));
   EXPECT_EQ(apk.GetFd(), 0);
   EXPECT_EQ(StateOf(apk), (State{false, false, false, false}));
 }
@@ -196,8 +182,8 @@ TEST(ApkInit, AnyOtherNegativeDescriptorIsUsedUnchangedWhenThereIsAPath) {
   LogCapture log;
   Apk apk(-1);
   log.Clear();
-  apk.Init(-2, file.path());
-  EXPECT_EQ(log.records(), Records({Error(std::string("OpenArchiveFd(-2) [file: ") + file.path() +
+  apk.Init(-2, file.path().c_str());
+  EXPECT_EQ(log.records(), Records({Error("OpenArchiveFd(-2) [file: " + file.path() +
                                           "] returned: -3: Invalid file\n")}));
   EXPECT_EQ(apk.GetFd(), -2);
 }

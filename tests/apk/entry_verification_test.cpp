@@ -260,30 +260,18 @@ TEST(VerifyEntryHash, AnEmptyEntryIsVerified) {
 
 // ---- One file.
 
-class DiskFile {
- public:
-  explicit DiskFile(const std::string& text) : path_(testing::TempDir() + "entry_test.so") {
-    WriteFile(path_, ToBytes(text));
-  }
-  ~DiskFile() { unlink(path_.c_str()); }
-  const std::string& path() const { return path_; }
-
- private:
-  std::string path_;
-};
-
 constexpr char kLibrary[] = "lib/arm64-v8a/libfoo.so";
 
 TEST(VerifyFileHash, TheNameSelectsTheDigestAndThePathSuppliesTheBytes) {
   OpenPackage open{PackageOptions()};
-  DiskFile library("\177ELF foo");
+  DiskFile library(ToBytes("\177ELF foo"));
   EXPECT_TRUE(open.apk.VerifyFileHash(kLibrary, library.path()));
   EXPECT_FALSE(open.apk.VerifyFileHash("classes.dex", library.path()));
 }
 
 TEST(VerifyFileHash, AMismatchIsNotReported) {
   OpenPackage open{PackageOptions()};
-  DiskFile library("\177ELF fop");
+  DiskFile library(ToBytes("\177ELF fop"));
   LogCapture log;
   EXPECT_FALSE(open.apk.VerifyFileHash(kLibrary, library.path()));
   EXPECT_EQ(log.records(), Records());
@@ -303,7 +291,7 @@ TEST(VerifyFileHash, AFileThatShrinksMeanwhileEndsInZeros) {
                      {"second", ToBytes("A second file")},
                      {"zeros", ToBytes(std::string("A") + std::string(12, '\0'))}};
   OpenPackage open(options);
-  DiskFile file("A second file");
+  DiskFile file(ToBytes("A second file"));
   ASSERT_TRUE(open.apk.VerifyFileHash("second", file.path()));
   EXPECT_FALSE(open.apk.VerifyFileHash("zeros", file.path()));
 
@@ -316,7 +304,7 @@ TEST(VerifyFileHash, AFileThatShrinksMeanwhileEndsInZeros) {
 
 TEST(VerifyFileHash, AFileListedWithMd5AloneIsUnsupported) {
   OpenPackage open(WithDigests({"MD5-Digest"}));
-  DiskFile library("\177ELF foo");
+  DiskFile library(ToBytes("\177ELF foo"));
   LogCapture log;
   EXPECT_FALSE(open.apk.VerifyFileHash(kLibrary, library.path()));
   EXPECT_EQ(log.records(), Records({Error("verifyData: Unsupported digest type: MD5-Digest\n")}));
@@ -350,7 +338,7 @@ TEST(VerifyFileHash, AFailedCheckLeavesTheRecordedDigestsAlone) {
   OpenPackage open{PackageOptions()};
   EXPECT_FALSE(open.apk.VerifyFileHash(kLibrary, "/nowhere"));
   EXPECT_FALSE(open.apk.VerifyFileHash("added.so", "/nowhere"));
-  DiskFile library("\177ELF foo");
+  DiskFile library(ToBytes("\177ELF foo"));
   EXPECT_TRUE(open.apk.VerifyFileHash(kLibrary, library.path()));
 }
 

@@ -7,6 +7,7 @@
 
 #include "crypto/processed_block.h"
 #include "support/keys.h"
+#include "support/temp_dir.h"
 
 namespace {
 
@@ -210,7 +211,8 @@ TEST(ProcessCertBounds, EveryChangeOfOneByteStaysInside) {
 }
 
 TEST(ProcessCert, BlockMadeByOpensslIsRead) {
-  const std::string base = testing::TempDir() + "pkcs7-by-openssl";
+  const TempDir folder;
+  const std::string base = folder.File("block");
   const std::string key = TestKeyPath("rsa-2048");
   std::ofstream(base + ".sf", std::ios::binary)
       .write(reinterpret_cast<const char*>(kSignatureFile.data()),
