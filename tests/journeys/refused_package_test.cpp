@@ -54,12 +54,20 @@ class RefusedPackage : public testing::Test {
 
   // The library is refused for these reasons; the package is signed and registered all the same.
   void ExpectLibraryRefusedAfter(std::initializer_list<std::string> reasons) const {
+    ExpectGoodPackageWith(Timeline(reasons), 1);
+  }
+
+  // Nothing is refused: the library and the package are signed, and the key is registered.
+  void ExpectAllSigned() const { ExpectGoodPackageWith(SignedLibrary(library_), 0); }
+
+  // The package is signed and registered after this happened to its library.
+  void ExpectGoodPackageWith(const std::string& library, int status) const {
     const Simulation run = Run();
     EXPECT_EQ(run.timeline,
-              Timeline({LibraryStep({Timeline(reasons)}), PackageStep(apk_),
+              Timeline({LibraryStep({library}), PackageStep(apk_),
                         Register(3, apk_, "com.example.app", ModulusOf("rsa-2048")),
                         Log(4, "ZuAddCertificate: ZuNewCertificate return 0.\n"), Exit(0)}));
-    EXPECT_EQ(run.status, 1);
+    EXPECT_EQ(run.status, status);
   }
 
   const Folder folder_;
@@ -80,13 +88,7 @@ TEST_F(TamperedPackage, LibraryOnDiskIsNotSigned) {
 
 TEST_F(TamperedPackage, LibraryInThePackageDoesNotMatterToTheOneOnDisk) {
   package_.Tamper("lib/arm64-v8a/libfoo.so");
-  const Simulation run = Run();
-
-  EXPECT_EQ(run.timeline,
-            Timeline({LibraryStep({SignedLibrary(library_)}), PackageStep(apk_),
-                      Register(3, apk_, "com.example.app", ModulusOf("rsa-2048")),
-                      Log(4, "ZuAddCertificate: ZuNewCertificate return 0.\n"), Exit(0)}));
-  EXPECT_EQ(run.status, 0);
+  ExpectAllSigned();
 }
 
 TEST_F(TamperedPackage, ManifestIsRefused) {
@@ -196,13 +198,7 @@ TEST_F(IncompletePackage, WithoutItsSignatureBlockIsRefused) {
 
 TEST_F(IncompletePackage, WithoutItsDexFileIsGood) {
   package_.Remove("classes.dex");
-  const Simulation run = Run();
-
-  EXPECT_EQ(run.timeline,
-            Timeline({LibraryStep({SignedLibrary(library_)}), PackageStep(apk_),
-                      Register(3, apk_, "com.example.app", ModulusOf("rsa-2048")),
-                      Log(4, "ZuAddCertificate: ZuNewCertificate return 0.\n"), Exit(0)}));
-  EXPECT_EQ(run.status, 0);
+  ExpectAllSigned();
 }
 
 TEST_F(IncompletePackage, LibraryThatIsNotOnDiskIsRefused) {
