@@ -1,42 +1,16 @@
-// Opening the archive, and the road of a package through its verification.
+// The archive: opening it, finding and extracting an entry, walking through all.
 #include <fcntl.h>
 
 #include <cerrno>
 #include <cstring>
-#include <utility>
 
 #include "apk/apk.h"
+#include "apk/extraction.h"
 #include "apk/zip_library.h"
 #include "util/file.h"
 #include "util/log.h"
 
 namespace ApkTools {
-
-const char* Apk::kMANIFEST_MF = "META-INF/MANIFEST.MF";
-
-Apk::Apk(int fd) { Init(fd, nullptr); }
-
-Apk::~Apk() = default;
-
-void Apk::Init(int fd, const char* path) {
-  zip_handle_ = nullptr;
-  is_apk_ = is_good_apk_ = dex_checked_ = is_good_zip_ = false;
-  fd_ = fd;
-  ss_permission_required_ = false;
-
-  if (!FindFile(path)) return;
-  if (!OpenZip(/*own_fd=*/fd == -1)) return;
-  is_good_zip_ = true;
-
-  std::vector<uint8_t> android_manifest;
-  const int32_t result = ExtractEntry("AndroidManifest.xml", android_manifest);
-  if (result != 0) {
-    LogError("Can't extract Android Manifest: %s\n", ErrorCodeString(result));
-    return;
-  }
-  is_apk_ = true;
-  is_good_apk_ = VerifyPackage(android_manifest);
-}
 
 // Settles descriptor and path, of which the caller may have given but one.
 bool Apk::FindFile(const char* path) {
@@ -76,33 +50,6 @@ int32_t Apk::ExtractEntry(const std::string& name, std::vector<uint8_t>& out) {
   const int32_t result = FindZipEntry(zip_handle_, name, &entry);
   if (result != 0) return result;
   return ExtractZipEntry(zip_handle_, &entry, out);
-}
-
-// The signature first, then what it vouches for.
-bool Apk::VerifyPackage(const std::vector<uint8_t>& android_manifest) {
-  std::vector<uint8_t> manifest;
-  if (ExtractEntry(kMANIFEST_MF, manifest) != 0) return false;
-
-  if (!InitCertSf()) return false;
-  if (!ValidateManifest(manifest)) {
-    LogError("Can't validate manifest.\n");
-    return false;
-  }
-  const size_t size = manifest.size();
-  ManifestMf manifest_mf;
-  EntryDigests entry_digests;
-  if (!entry_digests.Load(std::move(manifest), manifest_mf)) {
-    LogError("Can't load manifest: size=%zu\n", size);
-    return false;
-  }
-  if (!ParseAndroidManifest(android_manifest)) {
-    LogError("Can't process Android Manifest.\n");
-    return false;
-  }
-  // The one points into the other: they change together or not at all.
-  manifest_mf_ = std::move(manifest_mf);
-  entry_digests_ = std::move(entry_digests);
-  return true;
 }
 
 int32_t Apk::StartIteration(void** cookie, const std::string& prefix, const std::string& suffix) {

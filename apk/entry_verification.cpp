@@ -4,6 +4,7 @@
 
 #include "apk/apk.h"
 #include "apk/base64.h"
+#include "apk/extraction.h"
 #include "apk/zip_library.h"
 #include "util/file.h"
 #include "util/log.h"

@@ -8,7 +8,7 @@
 
 #include "apk/apk.h"
 #include "apk/base64.h"
-#include "apk/zip_library.h"
+#include "apk/extraction.h"
 #include "crypto/pkcs7.h"
 #include "crypto/rsa.h"
 #include "util/digest.h"

@@ -2,9 +2,8 @@
 //
 // Two generations of it are in use: up to API 29 it takes names as `ZipString`, later as
 // std::string_view. The templates below take what the library at hand offers, and only they see the
-// difference. And no entry's declared length is believed before memory is made for it. Archives,
-// entries and cookies are the library's own; all results are its codes (0: success). Nothing is
-// logged.
+// difference. Archives, entries and cookies are the library's own; all results are its codes (0:
+// success). Nothing is logged.
 #pragma once
 
 #include <ziparchive/zip_archive.h>
@@ -14,9 +13,6 @@
 #include <string_view>
 #include <type_traits>
 #include <utility>
-#include <vector>
-
-#include "util/file.h"
 
 struct ZipString;  // Defined by the older generation alone.
 
@@ -24,9 +20,7 @@ namespace ApkTools {
 
 // Codes of the library that its header does not name.
 inline constexpr int32_t kZipEntryNotFound = -7;
-inline constexpr int32_t kZipInconsistentInformation = -9;
 inline constexpr int32_t kZipInvalidEntryName = -10;
-inline constexpr int32_t kZipAllocationFailed = -13;
 
 // The longest name that a zip archive, and a `ZipString`, can hold, in bytes.
 inline constexpr size_t kZipLongestName = 0xffff;
@@ -113,40 +107,6 @@ int32_t NextZipEntry(void* cookie, typename Zip::Entry* entry, std::string& name
     if (result == 0) name.assign(reinterpret_cast<const char*>(found.name), found.name_length);
     return result;
   }
-}
-
-// Up to this length, in bytes, memory is made on an entry's word alone.
-inline constexpr uint32_t kZipTrustedLength = 64 << 20;
-
-// Whether an entry can be as long as it says: as long as its data when stored, else at most 1032
-// times as long, since deflate (RFC 1951 section 3.2.5) makes no more than 258 bytes of two bits.
-inline bool IsPlausibleLength(const ZipEntry& entry) {
-  constexpr uint64_t kMostPerByte = 1032;
-  if (entry.method == kCompressStored) return entry.uncompressed_length == entry.compressed_length;
-  return entry.uncompressed_length <= kMostPerByte * entry.compressed_length;
-}
-
-// Runs through an entry's data, keeping none of it. Succeeds when there is as much of it as the
-// entry says.
-inline int32_t ProveZipLength(ZipArchiveHandle archive, ZipEntry* entry) {
-  const auto keep_nothing = [](const uint8_t*, size_t, void*) { return true; };
-  return ProcessZipEntryContents(archive, entry, keep_nothing, nullptr);
-}
-
-// Extracts the entry whole into `out`, which becomes as long as the entry. Three are refused and
-// leave `out` alone: an entry that cannot be as long as it says (kZipInconsistentInformation), and
-// above kZipTrustedLength one whose data is not as long as it says (the library's code) and one
-// that is longer than can be had in memory (kZipAllocationFailed).
-inline int32_t ExtractZipEntry(ZipArchiveHandle archive, ZipEntry* entry,
-                               std::vector<uint8_t>& out) {
-  if (!IsPlausibleLength(*entry)) return kZipInconsistentInformation;
-  if (entry->uncompressed_length > kZipTrustedLength) {
-    const int32_t result = ProveZipLength(archive, entry);
-    if (result != 0) return result;
-    if (!FitsInMemory(entry->uncompressed_length)) return kZipAllocationFailed;
-  }
-  out.resize(entry->uncompressed_length);
-  return ExtractToMemory(archive, entry, out.data(), static_cast<uint32_t>(out.size()));
 }
 
 }  // namespace ApkTools

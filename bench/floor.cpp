@@ -6,7 +6,7 @@
 #include "bench/job.h"
 
 int main(int argc, char** argv) {
-  const OpenPackage package = OpenGivenPackage(argc, argv);
+  const GivenPackage package = OpenGiven(argc, argv);
   Buffer compiled_manifest, manifest, signature_file, block;
   Extract(package, "AndroidManifest.xml", compiled_manifest);
   Extract(package, "META-INF/MANIFEST.MF", manifest);
@@ -28,7 +28,7 @@ int main(int argc, char** argv) {
   SignLibraries(package, [&](const std::string&, const Buffer& content) {
     SHA256(content.data(), content.size(), digest);
   });
-  SignPackage(package);
+  SignGiven(package);
   Register(package, name, block.data(), block.size());
   return 0;
 }

@@ -37,14 +37,14 @@ void GiveUp(const char* why) {
   exit(1);
 }
 
-OpenPackage OpenGivenPackage(int argc, char** argv) {
+GivenPackage OpenGiven(int argc, char** argv) {
   if (argc != 2) GiveUp("expected the path of a package");
-  OpenPackage package = {open(argv[1], O_RDONLY), argv[1], nullptr};
+  GivenPackage package = {open(argv[1], O_RDONLY), argv[1], nullptr};
   if (OpenArchiveFd(package.fd, argv[1], &package.zip, false) != 0) GiveUp("no zip archive");
   return package;
 }
 
-void Extract(const OpenPackage& package, const std::string& name, Buffer& out) {
+void Extract(const GivenPackage& package, const std::string& name, Buffer& out) {
   ZipEntry entry;
   if (FindEntry(package.zip, name, &entry) != 0) GiveUp("entry not found");
   out.Resize(entry.uncompressed_length);
@@ -53,7 +53,7 @@ void Extract(const OpenPackage& package, const std::string& name, Buffer& out) {
   }
 }
 
-std::string SignatureFileName(const OpenPackage& package) {
+std::string SignatureFileName(const GivenPackage& package) {
   void* cookie;
   ZipEntry entry;
   std::string name;
@@ -81,7 +81,7 @@ std::string WalkManifest(const Buffer& compiled_manifest) {
   return package_name;
 }
 
-void SignLibraries(const OpenPackage& package, const CheckLibrary& check) {
+void SignLibraries(const GivenPackage& package, const CheckLibrary& check) {
   LogInfo("VeltSignJni starts: %d.\n", package.fd);
   constexpr std::string_view kInPackage = "lib/arm64-v8a";
   const std::string beside = package.path.substr(0, package.path.rfind('/') + 1) + "lib/arm64";
@@ -102,13 +102,13 @@ void SignLibraries(const OpenPackage& package, const CheckLibrary& check) {
   LogInfo("VeltSignJni finished: %u.\n", 0U);
 }
 
-void SignPackage(const OpenPackage& package) {
+void SignGiven(const GivenPackage& package) {
   LogInfo("VeltSign starts: zip_fd = %d, fd = %d.\n", package.fd, package.fd);
   AskKernel(package.fd);
   LogInfo("VeltSign finished: %u.\n", 0x10000U);
 }
 
-void Register(const OpenPackage& package, const std::string& name, const uint8_t* key,
+void Register(const GivenPackage& package, const std::string& name, const uint8_t* key,
               size_t length) {
   const int result = ZuNewCertificate(package.fd, name.c_str(), key, length);
   LogError("ZuAddCertificate: ZuNewCertificate failed %d.\n", result);

@@ -26,22 +26,22 @@ class Buffer {
 [[noreturn]] void GiveUp(const char* why);
 
 // The package that a program was started with.
-struct OpenPackage {
+struct GivenPackage {
   int fd;
   std::string path;
   struct ZipArchive* zip;  // the platform library's
 };
 
-OpenPackage OpenGivenPackage(int argc, char** argv);
-void Extract(const OpenPackage& package, const std::string& name, Buffer& out);
-std::string SignatureFileName(const OpenPackage& package);
+GivenPackage OpenGiven(int argc, char** argv);
+void Extract(const GivenPackage& package, const std::string& name, Buffer& out);
+std::string SignatureFileName(const GivenPackage& package);
 // The package's name, from the compiled manifest.
 std::string WalkManifest(const Buffer& compiled_manifest);
 
 // Reads each library beside the package whole, has `check` look at its entry's name and its bytes,
 // and then has the kernel asked to sign it, as the tool would.
 using CheckLibrary = std::function<void(const std::string& name, const Buffer& content)>;
-void SignLibraries(const OpenPackage& package, const CheckLibrary& check);
-void SignPackage(const OpenPackage& package);
-void Register(const OpenPackage& package, const std::string& name, const uint8_t* key,
+void SignLibraries(const GivenPackage& package, const CheckLibrary& check);
+void SignGiven(const GivenPackage& package);
+void Register(const GivenPackage& package, const std::string& name, const uint8_t* key,
               size_t length);

@@ -11,6 +11,7 @@
 #include <vector>
 
 #include "support/compiled_manifest.h"
+#include "support/files.h"
 #include "support/jar.h"
 #include "support/package.h"
 
@@ -50,7 +51,7 @@ class CircleOfFiles {
   std::ifstream file_;
 };
 
-void MakePackage(const Plan& plan, const std::string& directory);
+void MakePlanned(const Plan& plan, const std::string& directory);
 std::vector<ZipItem> Entries(const Plan& plan, const std::string& directory);
 std::string EntryName(size_t index);
 void DescribeEntries(PackageOptions& options, std::string& manifest);
@@ -67,14 +68,14 @@ int main(int argc, char** argv) {
     const std::string directory = std::string(argv[1]) + "/" + plan.name;
     if (std::filesystem::exists(directory + "/base.apk")) continue;
     printf("making %s\n", directory.c_str());
-    MakePackage(plan, directory);
+    MakePlanned(plan, directory);
   }
   return 0;
 }
 
 namespace {
 
-void MakePackage(const Plan& plan, const std::string& directory) {
+void MakePlanned(const Plan& plan, const std::string& directory) {
   std::filesystem::create_directories(directory + "/lib/arm64");
   PackageOptions options;
   options.secure_storage = true;
@@ -83,7 +84,7 @@ void MakePackage(const Plan& plan, const std::string& directory) {
   std::string manifest;
   DescribeEntries(options, manifest);
 
-  Package package = SignPackage(options);
+  Package package = MakePackage(options);
   for (const char* name : {kAndroidManifestName, kManifestName, "META-INF/CERT.SF"}) {
     package.Item(name).deflated = true;
   }

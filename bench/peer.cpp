@@ -27,7 +27,7 @@ void CheckDigest(std::string_view expected, const Buffer& content);
 }  // namespace
 
 int main(int argc, char** argv) {
-  const OpenPackage package = OpenGivenPackage(argc, argv);
+  const GivenPackage package = OpenGiven(argc, argv);
   Buffer compiled_manifest, manifest, signature_file, block;
   Extract(package, "AndroidManifest.xml", compiled_manifest);
   Extract(package, "META-INF/MANIFEST.MF", manifest);
@@ -47,7 +47,7 @@ int main(int argc, char** argv) {
   SignLibraries(package, [&](const std::string& library, const Buffer& content) {
     CheckDigest(entries.at(library), content);
   });
-  SignPackage(package);
+  SignGiven(package);
   Register(package, name, key.data(), key.size());
   return 0;
 }

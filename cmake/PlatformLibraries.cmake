@@ -15,3 +15,13 @@ foreach(name ziparchive androidfw utils log crypto)
     IMPORTED_LOCATION ${PLATFORM_${name}_LIBRARY}
     INTERFACE_INCLUDE_DIRECTORIES ${PLATFORM_INCLUDE_DIR})
 endforeach()
+
+# The zip library that everything here is built against: the one that is installed, or the one with
+# the interface of API level 27 that tests/compat puts in front of it.
+option(APKTOOLKIT_ZIPSTRING "Build against the zip library's interface of API level 27" OFF)
+if(APKTOOLKIT_ZIPSTRING)
+  add_subdirectory(tests/compat)
+  add_library(platform::zip ALIAS zipstring_library)
+else()
+  add_library(platform::zip ALIAS platform::ziparchive)
+endif()

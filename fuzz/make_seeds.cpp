@@ -7,6 +7,7 @@
 #include "fuzz/signer.h"
 #include "support/certificate.h"
 #include "support/compiled_manifest.h"
+#include "support/files.h"
 #include "support/jar.h"
 #include "support/package.h"
 #include "support/signature_block.h"
@@ -165,7 +166,7 @@ void MakeCompiledManifests() {
 
 // The first byte says what the phone is like: 0 is a healthy one, 2 gives the file "user.zu".
 void SeedPackage(const std::string& name, const PackageOptions& options, uint8_t phone = 0) {
-  Seed("package", name, Concat({{phone}, SignPackage(options).Build()}));
+  Seed("package", name, Concat({{phone}, MakePackage(options).Build()}));
 }
 
 void MakePackages() {

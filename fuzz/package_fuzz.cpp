@@ -20,6 +20,7 @@
 #include "fuzz/package_model.h"
 #include "fuzz/package_mutator.h"
 #include "support/certificate.h"
+#include "support/files.h"
 #include "support/package.h"
 #include "support/phone.h"
 

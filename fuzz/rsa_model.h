@@ -10,9 +10,5 @@
 // value that a key carries, read as signed. The modulus must be odd, the number below it.
 Bytes PublicOperation(const Bytes& number, const Bytes& modulus, uint32_t exponent);
 
-// The encoded message of the data (section 9.2) in `size` bytes, with as much padding as there is
-// room for, be it none; empty when it does not fit.
-Bytes EncodedMessage(Digest digest, const Bytes& data, size_t size);
-
 // Whether the signature is one of the data, over any of the three digests.
 bool Verifies(const Bytes& modulus, uint32_t exponent, const Bytes& data, const Bytes& signature);

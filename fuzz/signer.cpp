@@ -16,10 +16,6 @@
 
 namespace {
 
-struct FreeBignum {
-  void operator()(BIGNUM* number) const { BN_free(number); }
-};
-using Bignum = std::unique_ptr<BIGNUM, FreeBignum>;
 using Context = std::unique_ptr<BN_CTX, void (*)(BN_CTX*)>;
 
 // The private exponent that goes with a public one of the fuzz key; null when there is none.

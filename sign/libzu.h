@@ -4,5 +4,8 @@
 #include <cstddef>
 
 // Registers `length` bytes at `data` under `name` (NUL-terminated) for the open file `fd`. Borrows
-// everything. 0 and 0x10004 mean success, any other value a failure.
+// everything. IsZuSuccess tells what the result means.
 extern "C" int ZuNewCertificate(int fd, const char* name, const unsigned char* data, size_t length);
+
+// Two results mean success, every other is a failure.
+constexpr bool IsZuSuccess(int result) { return result == 0 || result == 0x10004; }

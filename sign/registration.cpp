@@ -80,8 +80,7 @@ void ReportMissingLocation(int fd) {
 }
 
 void ReportResult(int result) {
-  constexpr int kSecondSuccess = 0x10004;
-  if (result == 0 || result == kSecondSuccess) {
+  if (IsZuSuccess(result)) {
     LogInfo("ZuAddCertificate: ZuNewCertificate return %d.\n", result);
   } else {
     LogError("ZuAddCertificate: ZuNewCertificate failed %d.\n", result);

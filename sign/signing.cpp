@@ -16,8 +16,8 @@
 namespace {
 
 uint32_t VeltSignOat(ApkTools::Apk& apk, int fd);
-uint32_t SignPackage(ApkTools::Apk& apk, int fd);
-uint32_t SignJar(ApkTools::Apk& apk, int fd);
+uint32_t SignAsPackage(ApkTools::Apk& apk, int fd);
+uint32_t SignAsJar(ApkTools::Apk& apk, int fd);
 std::vector<uint8_t> SignPayload(const std::vector<uint8_t>& data);
 std::string InstalledLibraryPath(const std::string& package_path, const std::string& entry_name);
 void SignLibrary(ApkTools::Apk& apk, const std::string& entry_name, const std::string& target);
@@ -60,10 +60,10 @@ namespace {
 
 // Signs `fd`, the package file or one of its libraries, with the payload that suits `apk`.
 uint32_t VeltSignOat(ApkTools::Apk& apk, int fd) {
-  return apk.IsApk() ? SignPackage(apk, fd) : SignJar(apk, fd);
+  return apk.IsApk() ? SignAsPackage(apk, fd) : SignAsJar(apk, fd);
 }
 
-uint32_t SignPackage(ApkTools::Apk& apk, int fd) {
+uint32_t SignAsPackage(ApkTools::Apk& apk, int fd) {
   LogInfo("VeltSignOat: Apk case.\n");
   if (!apk.IsGoodApk()) return kVeltFailure;
   std::vector<uint8_t> digest;
@@ -76,7 +76,7 @@ uint32_t SignPackage(ApkTools::Apk& apk, int fd) {
   return result;
 }
 
-uint32_t SignJar(ApkTools::Apk& apk, int fd) {
+uint32_t SignAsJar(ApkTools::Apk& apk, int fd) {
   LogInfo("VeltSignOat: non-Apk (Jar) case\n");
   // Deliberate: what must be trusted already is the file that was opened as the archive, not `fd`.
   uint32_t result = VeltVerifyFd(apk.GetFd());

@@ -1,13 +1,13 @@
 #include "util/file.h"
 
 #include <fcntl.h>
-#include <sys/mman.h>
 #include <sys/stat.h>
 #include <unistd.h>
 
 #include <cerrno>
 
 #include "util/log.h"
+#include "util/memory.h"
 
 namespace {
 
@@ -54,18 +54,6 @@ bool ReadFile(const std::string& path, std::vector<uint8_t>& out, size_t& length
   // Deliberate: how much could be read is not asked. A file that shrinks meanwhile leaves the end
   // of `out` as it is; its digest, which every caller takes, then is not the expected one.
   length = ReadBytes(fd.get(), out);
-  return true;
-}
-
-bool FitsInMemory(size_t size) {
-  if (size == 0) return true;
-  const auto pages = static_cast<size_t>(sysconf(_SC_PHYS_PAGES));
-  const auto page_size = static_cast<size_t>(sysconf(_SC_PAGESIZE));
-  if (size / page_size >= pages) return false;
-  void* const trial =
-      mmap(nullptr, size, PROT_READ | PROT_WRITE, MAP_PRIVATE | MAP_ANONYMOUS, -1, 0);
-  if (trial == MAP_FAILED) return false;
-  munmap(trial, size);
   return true;
 }
 

@@ -18,12 +18,6 @@ bool ReadFile(const std::string& path, std::vector<uint8_t>& out);
 // The same, and tells in `length` how many bytes the file gave.
 bool ReadFile(const std::string& path, std::vector<uint8_t>& out, size_t& length);
 
-// Whether a vector may grow to `size` bytes. The vector itself cannot be asked: it ends the process
-// where it cannot grow. A sparse file and a zip bomb claim any size for nothing, and a kernel that
-// promises more memory than there is would end the process later, so the memory of the machine is
-// the limit, and the address space is tried.
-bool FitsInMemory(size_t size);
-
 // The path of the file that `fd` is open on, as the kernel tells it, cut to its first 4095 bytes;
 // empty when `fd` is not open or the kernel has no path to tell.
 std::string GetFilenameByFd(int fd);

@@ -4,6 +4,7 @@
 #include "apk/apk.h"
 #include "support/compiled_manifest.h"
 #include "support/log_capture.h"
+#include "support/package.h"
 
 using ApkTools::Apk;
 

@@ -10,10 +10,10 @@
 #include <fstream>
 #include <random>
 
-#include "apk/open_package.h"
 #include "support/compiled_manifest.h"
 #include "support/jar.h"
 #include "support/log_capture.h"
+#include "support/open_package.h"
 
 using ApkTools::Apk;
 
@@ -47,14 +47,8 @@ PackageOptions WithoutDex() {
   return options;
 }
 
-PackageOptions Jar() {
-  PackageOptions options;
-  options.android_manifest = Bytes();
-  return options;
-}
-
-// The package whose manifest is this text.
-PackageOptions WithManifest(const std::string& text) {
+// The same, whose manifest is this text.
+PackageOptions WithoutDexListedBy(const std::string& text) {
   PackageOptions options = WithoutDex();
   options.edit_manifest = [=](const std::string&) { return text; };
   return options;
@@ -93,7 +87,7 @@ TEST(ApkInit, AFileThatIsNotAZipLeavesANullHandle) {
 }
 
 TEST(ApkInit, AJarIsAGoodZipWhoseSignatureIsNotExamined) {
-  Package jar = SignPackage(Jar());
+  Package jar = MakePackage(PlainJar());
   jar.Tamper("META-INF/CERT.SF");
   LogCapture log;
   OpenPackage open(jar);
@@ -103,7 +97,7 @@ TEST(ApkInit, AJarIsAGoodZipWhoseSignatureIsNotExamined) {
 }
 
 TEST(ApkInit, APackageThatDoesNotVerifyIsAPackageThatIsNotGood) {
-  Package package = SignPackage(WithoutDex());
+  Package package = MakePackage(WithoutDex());
   package.Tamper(kManifestName);
   LogCapture log;
   OpenPackage open(package);
@@ -131,7 +125,7 @@ TEST(ApkInit, ThePathIsTheOneThatTheDescriptorResolvesTo) {
 TEST(ApkInit, AGivenPathIsKeptBesideTheDescriptor) {
   LogCapture log;
   Apk apk(-1);
-  MemoryFile file(SignPackage(WithoutDex()).Build());
+  MemoryFile file(MakePackage(WithoutDex()).Build());
   apk.Init(file.fd(), "/data/app/base.apk");
   EXPECT_EQ(apk.GetPath(), "/data/app/base.apk");
   EXPECT_EQ(apk.GetFd(), file.fd());
@@ -142,7 +136,7 @@ TEST(ApkInit, WithAPathAloneTheFileIsOpened) {
   LogCapture log;
   Apk apk(-1);
   log.Clear();
-  DiskFile file(SignPackage(WithoutDex()).Build());
+  DiskFile file(MakePackage(WithoutDex()).Build());
   apk.Init(-1, file.path().c_str());
   EXPECT_EQ(log.records(), Records());
   EXPECT_EQ(apk.GetPath(), file.path());
@@ -162,7 +156,7 @@ TEST(ApkInit, APathThatCannotBeOpenedIsReported) {
 }
 
 TEST(ApkInit, DescriptorZeroFromItsOwnOpenCountsAsAFailure) {
-  DiskFile file(SignPackage(WithoutDex()).Build());
+  DiskFile file(MakePackage(WithoutDex()).Build());
   LogCapture log;
   Apk apk(-1);
   log.Clear();
@@ -178,7 +172,7 @@ TEST(ApkInit, DescriptorZeroFromItsOwnOpenCountsAsAFailure) {
 }
 
 TEST(ApkInit, AnyOtherNegativeDescriptorIsUsedUnchangedWhenThereIsAPath) {
-  DiskFile file(SignPackage(WithoutDex()).Build());
+  DiskFile file(MakePackage(WithoutDex()).Build());
   LogCapture log;
   Apk apk(-1);
   log.Clear();
@@ -189,7 +183,7 @@ TEST(ApkInit, AnyOtherNegativeDescriptorIsUsedUnchangedWhenThereIsAPath) {
 }
 
 TEST(ApkInit, TheCallersDescriptorStaysOpen) {
-  MemoryFile file(SignPackage(WithoutDex()).Build());
+  MemoryFile file(MakePackage(WithoutDex()).Build());
   { Apk apk(file.fd()); }
   EXPECT_NE(fcntl(file.fd(), F_GETFD), -1);
 }
@@ -215,7 +209,7 @@ TEST(ApkInit, ASecondInitForgetsTheFirstOnesDigests) {
   DiskFile disk(ToBytes("only"));
   ASSERT_TRUE(open.apk.VerifyFileHash("lib/only.so", disk.path()));
 
-  MemoryFile second(SignPackage(WithoutDex()).Build());
+  MemoryFile second(MakePackage(WithoutDex()).Build());
   open.apk.Init(second.fd(), nullptr);
   ASSERT_TRUE(open.apk.IsGoodApk());
   LogCapture log;
@@ -231,7 +225,7 @@ TEST(ApkInit, ASecondInitThatFailsKeepsTheFirstOnesDigests) {
 
   PackageOptions bad = WithoutDex();
   bad.android_manifest = ToBytes("no compiled manifest");
-  MemoryFile second(SignPackage(bad).Build());
+  MemoryFile second(MakePackage(bad).Build());
   LogCapture log;
   open.apk.Init(second.fd(), nullptr);
   ASSERT_EQ(log.records().back(), Error("Can't process Android Manifest.\n"));
@@ -241,7 +235,7 @@ TEST(ApkInit, ASecondInitThatFailsKeepsTheFirstOnesDigests) {
 // ---- The road of a package, step by step.
 
 TEST(ApkInit, APackageWithoutManifestIsNotGoodAndSaysNothing) {
-  Package package = SignPackage(WithoutDex());
+  Package package = MakePackage(WithoutDex());
   package.Remove(kManifestName);
   LogCapture log;
   OpenPackage open(package);
@@ -250,7 +244,7 @@ TEST(ApkInit, APackageWithoutManifestIsNotGoodAndSaysNothing) {
 }
 
 TEST(ApkInit, TheNameOfTheManifestIsReadThroughItsPointer) {
-  Package package = SignPackage(WithoutDex());
+  Package package = MakePackage(WithoutDex());
   package.Item(kManifestName).name = "META-INF/OTHER.MF";
   const char* const usual = Apk::kMANIFEST_MF;
   Apk::kMANIFEST_MF = "META-INF/OTHER.MF";
@@ -263,7 +257,7 @@ TEST(ApkInit, TheNameOfTheManifestIsReadThroughItsPointer) {
 }
 
 TEST(ApkInit, ATamperedManifestIsReportedTwice) {
-  Package package = SignPackage(WithoutDex());
+  Package package = MakePackage(WithoutDex());
   package.Tamper(kManifestName);
   LogCapture log;
   OpenPackage open(package);
@@ -274,7 +268,7 @@ TEST(ApkInit, ATamperedManifestIsReportedTwice) {
 
 TEST(ApkInit, AManifestThatCannotBeParsedIsReportedWithItsSize) {
   LogCapture log;
-  OpenPackage open(WithManifest("Key:x"));
+  OpenPackage open(WithoutDexListedBy("Key:x"));
   EXPECT_EQ(log.records(),
             Records({Error("Parse manifest: Error: P_COLON: unexpected 0x78 after colon: x\n"),
                      Error("Can't load manifest: size=5\n")}));
@@ -283,7 +277,7 @@ TEST(ApkInit, AManifestThatCannotBeParsedIsReportedWithItsSize) {
 
 TEST(ApkInit, TheManifestTextHoldsItsNulBytes) {
   LogCapture log;
-  OpenPackage open(WithManifest(std::string("A: 1\r\n\r\nB\0C: 2\r\n\r\n", 19)));
+  OpenPackage open(WithoutDexListedBy(std::string("A: 1\r\n\r\nB\0C: 2\r\n\r\n", 19)));
   EXPECT_EQ(log.records(),
             Records({Error("Parse manifest: Error: P_KEY: unexpected end of file after key 'B'\n"),
                      Error("Can't load manifest: size=19\n")}));
@@ -300,7 +294,7 @@ TEST(ApkInit, AnAndroidManifestThatIsNotCompiledXmlIsReported) {
 }
 
 TEST(ApkInit, AManifestWithoutSectionsMakesAGoodPackage) {
-  OpenPackage open(WithManifest(""));
+  OpenPackage open(WithoutDexListedBy(""));
   EXPECT_EQ(StateOf(open.apk), (State{true, true, true, true}));
 }
 
@@ -308,7 +302,7 @@ TEST(ApkInit, AManifestWithoutSectionsMakesAGoodPackage) {
 
 // The package whose manifest has this one section, or these two.
 PackageOptions WithSections(const JarText& sections) {
-  return WithManifest(JarText::Manifest().EndSection().text() + sections.text());
+  return WithoutDexListedBy(JarText::Manifest().EndSection().text() + sections.text());
 }
 
 bool IsListed(Apk& apk, const std::string& name) {
@@ -427,7 +421,7 @@ TEST(ApkIteration, AFilterThatNoNameCanHaveIsAnInvalidName) {
 
 // The package with its Android manifest as given.
 std::string LogOfAndroidManifest(const ZipItem& item) {
-  Package package = SignPackage(WithoutDex());
+  Package package = MakePackage(WithoutDex());
   package.Item(kAndroidManifestName) = item;
   LogCapture log;
   OpenPackage open(package);
@@ -441,7 +435,7 @@ ZipItem AndroidManifestItem(bool deflated) {
 
 TEST(ApkEntries, ADeflatedAndroidManifestIsRead) {
   PackageOptions options = WithoutDex();
-  Package package = SignPackage(options);
+  Package package = MakePackage(options);
   package.Item(kAndroidManifestName).deflated = true;
   package.Item(kAndroidManifestName).data_descriptor = true;
   OpenPackage open(package);
@@ -489,7 +483,7 @@ TEST(ApkEntries, AnEntryWhoseDataDescriptorLiesIsInconsistent) {
 }
 
 TEST(ApkEntries, AnArchiveWithTwoEntriesOfANameIsNotOpened) {
-  Package package = SignPackage(WithoutDex());
+  Package package = MakePackage(WithoutDex());
   package.items.push_back(package.Item(kAndroidManifestName));
   LogCapture log;
   OpenPackage open(package);

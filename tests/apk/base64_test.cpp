@@ -6,6 +6,8 @@
 #include <string>
 #include <vector>
 
+#include "support/bytes.h"
+
 namespace {
 
 using Bytes = std::vector<uint8_t>;

@@ -5,10 +5,10 @@
 #include <algorithm>
 #include <functional>
 
-#include "apk/open_package.h"
 #include "apk/zip_library.h"
 #include "support/jar.h"
 #include "support/log_capture.h"
+#include "support/open_package.h"
 
 using ApkTools::Apk;
 
@@ -29,13 +29,6 @@ constexpr char kDexFailed[] = "Integrity not confirmed: classes.dex\n";
 PackageOptions WithDigests(const std::vector<std::string>& digests) {
   PackageOptions options;
   options.digests = digests;
-  return options;
-}
-
-// The good package whose manifest is this text.
-PackageOptions WithManifest(const std::string& text) {
-  PackageOptions options;
-  options.edit_manifest = [=](const std::string&) { return text; };
   return options;
 }
 
@@ -72,7 +65,7 @@ TEST(IsGoodApk, ADexThatTheManifestDoesNotListIsReportedOnce) {
 }
 
 TEST(IsGoodApk, ATamperedDexIsBadAndStaysBad) {
-  Package package = SignPackage();
+  Package package = MakePackage();
   package.Tamper("classes.dex");
   LogCapture log;
   OpenPackage open(package);
@@ -83,7 +76,7 @@ TEST(IsGoodApk, ATamperedDexIsBadAndStaysBad) {
 }
 
 TEST(IsGoodApk, OtherEntriesAreNotExamined) {
-  Package package = SignPackage();
+  Package package = MakePackage();
   package.Tamper("lib/arm64-v8a/libfoo.so");
   OpenPackage open(package);
   EXPECT_TRUE(open.apk.IsGoodApk());
@@ -98,7 +91,7 @@ void ChangeDex(OpenPackage& open, const Bytes& archive) {
 }
 
 TEST(IsGoodApk, AfterOneSuccessTheArchiveIsNotReadAgain) {
-  const Bytes archive = SignPackage().Build();
+  const Bytes archive = MakePackage().Build();
   OpenPackage open(archive);
   EXPECT_TRUE(open.apk.IsGoodApk());
   ChangeDex(open, archive);
@@ -106,7 +99,7 @@ TEST(IsGoodApk, AfterOneSuccessTheArchiveIsNotReadAgain) {
 }
 
 TEST(IsGoodApk, TheArchiveIsReadWhenItIsFirstAsked) {
-  const Bytes archive = SignPackage().Build();
+  const Bytes archive = MakePackage().Build();
   LogCapture log;
   OpenPackage open(archive);
   ChangeDex(open, archive);
@@ -114,7 +107,7 @@ TEST(IsGoodApk, TheArchiveIsReadWhenItIsFirstAsked) {
 }
 
 TEST(IsGoodApk, APackageThatInitJudgedBadIsNotExamined) {
-  Package package = SignPackage();
+  Package package = MakePackage();
   package.Remove(kManifestName);
   LogCapture log;
   OpenPackage open(package);
@@ -123,7 +116,7 @@ TEST(IsGoodApk, APackageThatInitJudgedBadIsNotExamined) {
 }
 
 TEST(IsGoodApk, ADexThatIsThereButCannotBeFoundIsBad) {
-  Package package = SignPackage();
+  Package package = MakePackage();
   package.Item("classes.dex").local_name = "Classes.dex";  // the two headers disagree
   LogCapture log;
   OpenPackage open(package);
@@ -132,7 +125,7 @@ TEST(IsGoodApk, ADexThatIsThereButCannotBeFoundIsBad) {
 }
 
 TEST(IsGoodApk, ADexOfAnImpossibleLengthIsBad) {
-  Package package = SignPackage();
+  Package package = MakePackage();
   ZipItem& dex = package.Item("classes.dex");
   dex.deflated = true;
   dex = ClaimingLength(dex, 0xfffffffe);
@@ -145,7 +138,7 @@ TEST(IsGoodApk, ADexOfAnImpossibleLengthIsBad) {
 TEST(IsGoodApk, OtherDexFilesAreNotExamined) {
   PackageOptions options;
   options.entries.push_back({"classes2.dex", ToBytes("dex\n035 2")});
-  Package package = SignPackage(options);
+  Package package = MakePackage(options);
   package.Tamper("classes2.dex");
   OpenPackage open(package);
   EXPECT_TRUE(open.apk.IsGoodApk());
@@ -197,7 +190,7 @@ TEST(VerifyEntryHash, AnEntryListedWithBothIsNotVerifiedWithSha256) {
 }
 
 TEST(VerifyEntryHash, AMismatchIsNotReported) {
-  Package package = SignPackage();
+  Package package = MakePackage();
   package.Tamper("classes.dex");
   LogCapture log;
   OpenPackage open(package);
@@ -225,7 +218,7 @@ TEST(VerifyEntryHash, AnUndecodableDigestNeverMatches) {
 }
 
 TEST(VerifyEntryHash, AnEntryThatCannotBeExtractedIsNotReported) {
-  Package package = SignPackage();
+  Package package = MakePackage();
   ZipItem& dex = package.Item("classes.dex");
   dex = ClaimingLength(dex, 3);
   LogCapture log;
@@ -235,7 +228,7 @@ TEST(VerifyEntryHash, AnEntryThatCannotBeExtractedIsNotReported) {
 }
 
 TEST(VerifyEntryHash, AnEntryThatTheManifestDoesNotListIsReported) {
-  Package package = SignPackage();
+  Package package = MakePackage();
   package.items.push_back({"added.so", ToBytes("added")});
   LogCapture log;
   OpenPackage open(package);

@@ -12,6 +12,7 @@
 #include <string>
 #include <vector>
 
+#include "support/files.h"
 #include "support/log_capture.h"
 
 // Steps a parser whose state is none of its states.
@@ -360,11 +361,6 @@ TEST(ManifestMf, EveryPrefixOfAManifestEnds) {
 
 // Below, the JDK's parser is asked about manifests as tools write them.
 
-std::string ReadText(const std::string& path) {
-  std::ifstream file(path, std::ios::binary);
-  return {std::istreambuf_iterator<char>(file), {}};
-}
-
 // A line as the JAR File Specification has it: at most 72 bytes, continued after a space.
 std::string Line(const std::string& name, const std::string& value) {
   std::string line = name + ": " + value;
@@ -432,20 +428,16 @@ std::string Dump(const Sections& sections) {
 
 TEST(ManifestMf, AgreesWithTheJdkOnWellFormedManifests) {
   constexpr uint32_t kCount = 200;
-  std::string directory = testing::TempDir() + "manifest_mf_test.XXXXXX";
-  ASSERT_NE(nullptr, mkdtemp(directory.data()));
-  const auto path = [&](uint32_t i) { return directory + "/" + std::to_string(i) + ".mf"; };
-  for (uint32_t i = 0; i < kCount; ++i) {
-    std::ofstream(path(i), std::ios::binary) << ManifestWriter(i).Write();
-  }
+  const TempDir folder;
+  const auto path = [&](uint32_t i) { return folder / (std::to_string(i) + ".mf"); };
+  for (uint32_t i = 0; i < kCount; ++i) WriteFile(path(i), ToBytes(ManifestWriter(i).Write()));
   const auto program = std::filesystem::path(__FILE__).replace_filename("DumpManifest.java");
-  ASSERT_EQ(0, std::system(("java " + program.string() + " " + directory).c_str()));
+  ASSERT_EQ(0, std::system(("java " + program.string() + " " + folder.path()).c_str()));
   for (uint32_t i = 0; i < kCount; ++i) {
-    const std::string expected = ReadText(path(i) + ".dump");
-    EXPECT_EQ(expected, Dump(Parse(ReadText(path(i))))) << "manifest " << i;
-    EXPECT_EQ(expected, Dump(Parse(ReadText(path(i) + ".rewritten")))) << "rewritten " << i;
+    const std::string expected = ContentOf(path(i) + ".dump");
+    EXPECT_EQ(expected, Dump(Parse(ContentOf(path(i))))) << "manifest " << i;
+    EXPECT_EQ(expected, Dump(Parse(ContentOf(path(i) + ".rewritten")))) << "rewritten " << i;
   }
-  std::filesystem::remove_all(directory);
 }
 
 }  // namespace

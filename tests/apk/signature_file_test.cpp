@@ -3,10 +3,10 @@
 
 #include <algorithm>
 
-#include "apk/open_package.h"
 #include "support/certificate.h"
 #include "support/jar.h"
 #include "support/log_capture.h"
+#include "support/open_package.h"
 #include "support/signature_block.h"
 
 using ApkTools::Apk;
@@ -23,7 +23,7 @@ Records LogOf(const Package& package) {
   return log.records();
 }
 
-Records LogOf(const PackageOptions& options) { return LogOf(SignPackage(options)); }
+Records LogOf(const PackageOptions& options) { return LogOf(MakePackage(options)); }
 
 PackageOptions WithBlock(const SignatureBlock& block) {
   PackageOptions options;
@@ -48,7 +48,7 @@ TEST(InitCertSf, ABlockGoesByTheBaseNameOfItsSignatureFile) {
   options.base_name = "META-INF/ANDROIDD";
   EXPECT_EQ(LogOf(options), Records());
 
-  Package package = SignPackage(options);
+  Package package = MakePackage(options);
   package.Item("META-INF/ANDROIDD.RSA").name = "META-INF/CERT.RSA";
   EXPECT_EQ(LogOf(package),
             Records({Error("Can't extract RSA certificate: META-INF/ANDROIDD.RSA\n")}));
@@ -61,7 +61,7 @@ TEST(InitCertSf, TheLastDotEndsTheBaseName) {
 }
 
 TEST(InitCertSf, WithoutASignatureFileItFailsSilently) {
-  Package package = SignPackage();
+  Package package = MakePackage();
   package.Remove("META-INF/CERT.SF");
   LogCapture log;
   OpenPackage open(package);
@@ -70,7 +70,7 @@ TEST(InitCertSf, WithoutASignatureFileItFailsSilently) {
 }
 
 TEST(InitCertSf, ASignatureFileInLowerCaseIsNone) {
-  Package package = SignPackage();
+  Package package = MakePackage();
   package.Item("META-INF/CERT.SF").name = "META-INF/cert.sf";
   package.Item("META-INF/CERT.RSA").name = "META-INF/cert.RSA";
   LogCapture log;
@@ -90,7 +90,7 @@ TEST(InitCertSf, ASignatureFileElsewhereIsNone) {
 
 TEST(InitCertSf, ASignatureFileThatCannotBeExtractedFailsSilently) {
   for (const uint32_t length : {1u, 0xfffffffeu}) {
-    Package package = SignPackage();
+    Package package = MakePackage();
     ZipItem& file = package.Item("META-INF/CERT.SF");
     file.deflated = true;
     file = ClaimingLength(file, length);
@@ -107,13 +107,13 @@ TEST(InitCertSf, ASignatureFileThatDoesNotParseIsTheParsersMessageAlone) {
 }
 
 TEST(InitCertSf, ABlockThatIsMissingIsReported) {
-  Package package = SignPackage();
+  Package package = MakePackage();
   package.Remove("META-INF/CERT.RSA");
   EXPECT_EQ(LogOf(package), Records({Error("Can't extract RSA certificate: META-INF/CERT.RSA\n")}));
 }
 
 TEST(InitCertSf, ABlockThatCannotBeExtractedIsReported) {
-  Package package = SignPackage();
+  Package package = MakePackage();
   ZipItem& block = package.Item("META-INF/CERT.RSA");
   block.deflated = true;
   block = ClaimingLength(block, 0xfffffffe);
@@ -133,7 +133,7 @@ TEST(InitCertSf, BlocksOfOtherKindsAreNotLookedFor) {
 TEST(InitCertSf, OfTwoSignersTheFirstInTheArchivesOrderDecides) {
   PackageOptions options;
   options.base_name = "META-INF/OTHER";
-  Package package = SignPackage(options);
+  Package package = MakePackage(options);
   package.items.push_back({"META-INF/CERT.SF", ToBytes("Key:x")});
 
   LogCapture log;
@@ -148,7 +148,7 @@ TEST(InitCertSf, OfTwoSignersTheFirstInTheArchivesOrderDecides) {
 }
 
 TEST(InitCertSf, ATamperedSignatureFileIsNotVerified) {
-  Package package = SignPackage();
+  Package package = MakePackage();
   Bytes& text = package.Item("META-INF/CERT.SF").data;
   *std::find(text.begin(), text.end(), '1') = '2';  // of "Signature-Version: 1.0"
   EXPECT_EQ(LogOf(package),
@@ -190,7 +190,7 @@ TEST(VerifyCertificate, ExponentsOfOneByteVerify) {
 }
 
 TEST(VerifyCertificate, WhatIsNoSignatureBlockIsAnUnknownType) {
-  Package package = SignPackage();
+  Package package = MakePackage();
   package.Item("META-INF/CERT.RSA").data = ToBytes("no block");
   testing::internal::CaptureStdout();
   EXPECT_EQ(LogOf(package), Records({Error("Unknown certificate type"), Error(kNotVerified)}));
@@ -198,7 +198,7 @@ TEST(VerifyCertificate, WhatIsNoSignatureBlockIsAnUnknownType) {
 }
 
 TEST(VerifyCertificate, AnEmptyBlockIsAnUnknownType) {
-  Package package = SignPackage();
+  Package package = MakePackage();
   package.Item("META-INF/CERT.RSA").data = {};
   testing::internal::CaptureStdout();
   EXPECT_EQ(LogOf(package), Records({Error("Unknown certificate type"), Error(kNotVerified)}));
@@ -311,7 +311,7 @@ TEST(VerifyCertificate, ASignatureThatTheBlockEndsBeforeFails) {
 template <typename Encode>
 PackageOptions WithEncodedSignature(Encode encode) {
   PackageOptions options;
-  const Bytes signature_file = SignPackage(options).Item("META-INF/CERT.SF").data;
+  const Bytes signature_file = MakePackage(options).Item("META-INF/CERT.SF").data;
   options.block.encrypted_digest = encode(SignWith("rsa-2048", Digest::kSha256, signature_file));
   return options;
 }
@@ -394,7 +394,7 @@ Records RefusedTwice() {
 // A section of "-Digest-Manifest" attributes, each over the package's manifest or over other bytes.
 JarText ManifestDigests(const std::vector<std::string>& right,
                         const std::vector<std::string>& wrong) {
-  const Bytes manifest = SignPackage().Item(kManifestName).data;
+  const Bytes manifest = MakePackage().Item(kManifestName).data;
   return JarText().Digests(right, manifest, "-Manifest").Digests(wrong, {}, "-Manifest");
 }
 
@@ -437,7 +437,7 @@ TEST(ValidateManifest, ASignatureFileWhoseSectionDoesNotEndHasNoDigest) {
 }
 
 TEST(ValidateManifest, TheMainAttributesDigestIsIgnored) {
-  const Bytes manifest = SignPackage().Item(kManifestName).data;
+  const Bytes manifest = MakePackage().Item(kManifestName).data;
   EXPECT_EQ(LogOf(WithSignatureFile(
                 JarText()
                     .Digests({"SHA-256-Digest"}, manifest, "-Manifest-Main-Attributes")
@@ -460,7 +460,7 @@ TEST(ValidateManifest, TheFirstSectionWithADigestDecides) {
 }
 
 TEST(ValidateManifest, ADigestThatDoesNotDecodeIsRefused) {
-  const Bytes manifest = SignPackage().Item(kManifestName).data;
+  const Bytes manifest = MakePackage().Item(kManifestName).data;
   const std::string digest = DigestText("SHA-256-Digest", manifest);
   const auto file = [&](const std::string& value) {
     return WithSignatureFile("SHA-256-Digest-Manifest: " + value + "\r\n\r\n");

@@ -6,8 +6,8 @@
 #include <iterator>
 
 #include "crypto/processed_block.h"
+#include "support/files.h"
 #include "support/keys.h"
-#include "support/temp_dir.h"
 
 namespace {
 
@@ -212,18 +212,15 @@ TEST(ProcessCertBounds, EveryChangeOfOneByteStaysInside) {
 
 TEST(ProcessCert, BlockMadeByOpensslIsRead) {
   const TempDir folder;
-  const std::string base = folder.File("block");
+  const std::string base = folder / "block";
   const std::string key = TestKeyPath("rsa-2048");
-  std::ofstream(base + ".sf", std::ios::binary)
-      .write(reinterpret_cast<const char*>(kSignatureFile.data()),
-             static_cast<std::streamsize>(kSignatureFile.size()));
+  WriteFile(base + ".sf", kSignatureFile);
   const std::string command = "openssl req -x509 -new -key " + key + " -subj /CN=Test -out " +
                               base + ".pem 2>/dev/null && openssl smime -sign -noattr -binary " +
                               "-md sha256 -outform DER -signer " + base + ".pem -inkey " + key +
                               " -in " + base + ".sf -out " + base + ".rsa";
   ASSERT_EQ(system(command.c_str()), 0);
-  std::ifstream file(base + ".rsa", std::ios::binary);
-  const ProcessedBlock processed{Bytes(std::istreambuf_iterator<char>(file), {})};
+  const ProcessedBlock processed{ToBytes(ContentOf(base + ".rsa"))};
   ASSERT_EQ(processed.result, 0);
   const pkcs7& record = processed.record;
   EXPECT_EQ(Field(record.signed_digest, record.signed_digest_length),

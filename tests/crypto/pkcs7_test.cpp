@@ -2,23 +2,15 @@
 #include "crypto/pkcs7.h"
 
 #include <gtest/gtest.h>
-#include <openssl/bn.h>
 
 #include <algorithm>
 #include <cstddef>
 #include <cstring>
 
 #include "crypto/processed_block.h"
-#include "support/keys.h"
+#include "support/package.h"
 
 namespace {
-
-Bytes ModulusOf(const std::string& key) {
-  const BIGNUM* n = RSA_get0_n(TestRsaKey(key));
-  Bytes modulus(BN_num_bytes(n));
-  BN_bn2bin(n, modulus.data());
-  return modulus;
-}
 
 // Where `part` is in `whole`; fails the test when it is nowhere.
 size_t Find(const Bytes& whole, const Bytes& part) {

@@ -8,14 +8,14 @@
 
 #include <algorithm>
 #include <filesystem>
-#include <fstream>
-#include <sstream>
 
-#include "journeys/simulation.h"
-#include "simulator/phone.h"
-#include "simulator/run.h"
-#include "simulator/verdict.h"
+#include "simulator/phone/settings.h"
+#include "simulator/phone/text.h"
+#include "simulator/program/run.h"
+#include "simulator/program/verdict.h"
+#include "support/files.h"
 #include "support/package.h"
+#include "support/simulation.h"
 
 namespace {
 
@@ -38,13 +38,6 @@ class KeptStandardError {
  private:
   const int saved_;
 };
-
-std::string ReadText(const std::string& path) {
-  std::ifstream file(path);
-  std::stringstream text;
-  text << file.rdbuf();
-  return text.str();
-}
 
 // A file installed in a folder of its own, and the phone that it is installed on.
 class Installed {
@@ -72,7 +65,8 @@ class Installed {
     std::filesystem::remove(folder_ / "journal");
     phone_.journal = folder_ / "journal";
     Command command = {
-        {}, TOOL_PATH, file_, FAULT_INJECTOR ":" KERNEL_STAND_IN, PhoneToEnvironment(phone_), 20};
+        {}, TOOL_PATH, file_, FAULT_INJECTOR ":" KERNEL_STAND_IN, SettingsToEnvironment(phone_),
+        20};
     if (AreProgramsEmulated()) command.runner = Split(APKTOOLKIT_RUNNER, ' ');
     command.environment.push_back("APKTOOLKIT_FAULT=" + fault);
     command.environment.push_back("APKTOOLKIT_FAULT_REPORT=" + folder_ / "report");
@@ -82,8 +76,8 @@ class Installed {
       outcome.ending = ::Run(command);
     }
     outcome.failed = std::filesystem::exists(folder_ / "report");
-    outcome.grants = Grants(ReadText(phone_.journal));
-    outcome.errors = ReadText(folder_ / "errors");
+    outcome.grants = Grants(ContentOf(phone_.journal));
+    outcome.errors = ContentOf(folder_ / "errors");
     return outcome;
   }
 
@@ -103,8 +97,8 @@ class Installed {
     return grants;
   }
 
-  Folder folder_;
-  Phone phone_;
+  TempDir folder_;
+  PhoneSettings phone_;
   std::string file_;
 };
 
@@ -151,19 +145,19 @@ class Faults : public testing::TestWithParam<const char*> {
 TEST_P(Faults, LetAGoodPackageBeSignedAsFarAsItWasVerified) {
   PackageOptions options;
   options.secure_storage = true;
-  Installed file(SignPackage(options));
+  Installed file(MakePackage(options));
   Sweep(file, GetParam(), AllowedGrants(file, 3));
 }
 
 TEST_P(Faults, LetATrustedJarBeSignedAndNothingElse) {
   PackageOptions options;
   options.android_manifest = Bytes();
-  Installed file(SignPackage(options), /*is_trusted=*/true);
+  Installed file(MakePackage(options), /*is_trusted=*/true);
   Sweep(file, GetParam(), AllowedGrants(file, 1));
 }
 
 TEST_P(Faults, NeverGetAnythingSignedForAPackageThatIsNotGood) {
-  Package package = SignPackage();
+  Package package = MakePackage();
   package.Tamper("classes.dex");
   Installed file(package);
   Sweep(file, GetParam(), AllowedGrants(file, 0));
@@ -172,7 +166,7 @@ TEST_P(Faults, NeverGetAnythingSignedForAPackageThatIsNotGood) {
 TEST_P(Faults, NeverGetALibrarySignedThatIsNotTheManifests) {
   PackageOptions options;
   options.entries = {{"lib/arm64-v8a/libfoo.so", ToBytes("\177ELF other")}};
-  Installed file(SignPackage(options));
+  Installed file(MakePackage(options));
   Sweep(file, GetParam(), AllowedGrants(file, 1));
 }
 

@@ -7,18 +7,20 @@
 #include <filesystem>
 #include <regex>
 
-#include "journeys/simulation.h"
-#include "journeys/timeline.h"
+#include "support/expected_timeline.h"
+#include "support/files.h"
 #include "support/package.h"
+#include "support/process.h"
+#include "support/simulation.h"
 
 namespace {
 
 // A good package with its library.
 class CommandLine : public testing::Test {
  protected:
-  CommandLine() { SignPackage().WriteTo(apk_); }
+  CommandLine() { MakePackage().WriteTo(apk_); }
 
-  const Folder folder_;
+  const TempDir folder_;
   const std::string apk_ = folder_ / "base.apk";
   const std::string library_ = folder_.Write("lib/arm64/libfoo.so", ToBytes("\177ELF foo"));
 };
@@ -67,7 +69,7 @@ std::vector<std::string> OnItsOwnFileSystem(const std::string& package,
 }
 
 TEST_F(CommandLine, FileOnAReadOnlyFileSystemEndsSilently) {
-  const Folder mount_point;
+  const TempDir mount_point;
   const std::string apk = mount_point / "base.apk";
 
   const Simulation run =
@@ -78,7 +80,7 @@ TEST_F(CommandLine, FileOnAReadOnlyFileSystemEndsSilently) {
 }
 
 TEST_F(CommandLine, FileOnTheSameFileSystemWritableIsWorkedOn) {
-  const Folder mount_point;
+  const TempDir mount_point;
   const std::string apk = mount_point / "base.apk";
   const std::string library = mount_point / "lib/arm64/libfoo.so";
 
@@ -101,7 +103,7 @@ std::string WorkstationLog(const std::string& errors) {
 TEST_F(CommandLine, WithoutASimulatedPhoneNothingCanBeSigned) {
   PackageOptions options;
   options.secure_storage = true;
-  SignPackage(options).WriteTo(apk_);
+  MakePackage(options).WriteTo(apk_);
   const std::string not_signed = std::string("E VELT can't sign a file (result=10000, errno 2: ") +
                                  strerror(ENOENT) + ").\n\n";
 

@@ -5,8 +5,9 @@
 #include <filesystem>
 #include <fstream>
 
-#include "journeys/simulation.h"
-#include "journeys/timeline.h"
+#include "support/expected_timeline.h"
+#include "support/process.h"
+#include "support/simulation.h"
 
 namespace {
 

@@ -3,9 +3,10 @@
 
 #include <filesystem>
 
-#include "journeys/simulation.h"
-#include "journeys/timeline.h"
+#include "support/expected_timeline.h"
+#include "support/files.h"
 #include "support/package.h"
+#include "support/simulation.h"
 
 namespace {
 
@@ -19,12 +20,12 @@ PackageOptions WithLibrary(const std::string& entry_name) {
 }
 
 TEST(GoodPackage, LibraryIsSignedThenThePackageThenItsKeyIsRegistered) {
-  const Folder folder;
+  const TempDir folder;
   const std::string apk = folder / "base.apk";
   const std::string library = folder.Write("lib/arm64/libfoo.so", kLibrary);
   PackageOptions options = WithLibrary("lib/arm64-v8a/libfoo.so");
   options.secure_storage = true;
-  SignPackage(options).WriteTo(apk);
+  MakePackage(options).WriteTo(apk);
 
   const Simulation run = Simulate(apk);
 
@@ -47,10 +48,10 @@ TEST(GoodPackage, LibraryIsSignedThenThePackageThenItsKeyIsRegistered) {
 }
 
 TEST(GoodPackage, WithoutThePermissionItIsNotRegistered) {
-  const Folder folder;
+  const TempDir folder;
   const std::string apk = folder / "base.apk";
   const std::string library = folder.Write("lib/arm64/libfoo.so", kLibrary);
-  SignPackage(WithLibrary("lib/arm64-v8a/libfoo.so")).WriteTo(apk);
+  MakePackage(WithLibrary("lib/arm64-v8a/libfoo.so")).WriteTo(apk);
 
   const Simulation run = Simulate(apk);
 
@@ -60,11 +61,11 @@ TEST(GoodPackage, WithoutThePermissionItIsNotRegistered) {
 }
 
 TEST(GoodPackage, WithoutLibrariesOnlyThePackageIsSigned) {
-  const Folder folder;
+  const TempDir folder;
   const std::string apk = folder / "base.apk";
   PackageOptions options;
   options.entries = {{"classes.dex", ToBytes("dex\n035")}};
-  SignPackage(options).WriteTo(apk);
+  MakePackage(options).WriteTo(apk);
 
   const Simulation run = Simulate(apk);
 
@@ -73,11 +74,11 @@ TEST(GoodPackage, WithoutLibrariesOnlyThePackageIsSigned) {
 }
 
 TEST(GoodPackage, WithoutADexFileIsGood) {
-  const Folder folder;
+  const TempDir folder;
   const std::string apk = folder / "base.apk";
   PackageOptions options;
   options.entries = {};
-  SignPackage(options).WriteTo(apk);
+  MakePackage(options).WriteTo(apk);
 
   const Simulation run = Simulate(apk);
 
@@ -96,10 +97,10 @@ void PrintTo(const Row& row, std::ostream* out) { *out << row.entry_name; }
 class LibraryDirectory : public testing::TestWithParam<Row> {};
 
 TEST_P(LibraryDirectory, IsWhereTheEntryIsSigned) {
-  const Folder folder;
+  const TempDir folder;
   const std::string apk = folder / "base.apk";
   const std::string library = folder.Write(GetParam().installed, kLibrary);
-  SignPackage(WithLibrary(GetParam().entry_name)).WriteTo(apk);
+  MakePackage(WithLibrary(GetParam().entry_name)).WriteTo(apk);
 
   const Simulation run = Simulate(apk);
 
@@ -121,10 +122,10 @@ INSTANTIATE_TEST_SUITE_P(
 class NoLibrary : public testing::TestWithParam<Row> {};
 
 TEST_P(NoLibrary, IsPassedOverSilently) {
-  const Folder folder;
+  const TempDir folder;
   const std::string apk = folder / "base.apk";
   folder.Write(GetParam().installed, kLibrary);
-  SignPackage(WithLibrary(GetParam().entry_name)).WriteTo(apk);
+  MakePackage(WithLibrary(GetParam().entry_name)).WriteTo(apk);
 
   const Simulation run = Simulate(apk);
 
@@ -140,10 +141,10 @@ INSTANTIATE_TEST_SUITE_P(
     [](const auto& row) { return row.param.description; });
 
 TEST(GoodPackage, NamedWithoutAFolderIsFoundThroughItsDescriptor) {
-  const Folder folder;
+  const TempDir folder;
   const std::string apk = folder / "base.apk";
   const std::string library = folder.Write("lib/arm64/libfoo.so", kLibrary);
-  SignPackage(WithLibrary("lib/arm64-v8a/libfoo.so")).WriteTo(apk);
+  MakePackage(WithLibrary("lib/arm64-v8a/libfoo.so")).WriteTo(apk);
 
   const Simulation run = Simulate("base.apk", {}, {{}, folder.path()});
 
@@ -153,11 +154,11 @@ TEST(GoodPackage, NamedWithoutAFolderIsFoundThroughItsDescriptor) {
 }
 
 TEST(GoodPackage, ReachedThroughALinkHasItsLibrariesBesideTheFileItself) {
-  const Folder folder;
+  const TempDir folder;
   const std::string apk = folder / "base.apk";
   const std::string library = folder.Write("lib/arm64/libfoo.so", kLibrary);
-  SignPackage(WithLibrary("lib/arm64-v8a/libfoo.so")).WriteTo(apk);
-  const Folder elsewhere;
+  MakePackage(WithLibrary("lib/arm64-v8a/libfoo.so")).WriteTo(apk);
+  const TempDir elsewhere;
   std::filesystem::create_symlink(apk, elsewhere / "link.apk");
 
   const Simulation run = Simulate(elsewhere / "link.apk");

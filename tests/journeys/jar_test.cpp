@@ -6,9 +6,10 @@
 #include <cerrno>
 #include <cstring>
 
-#include "journeys/simulation.h"
-#include "journeys/timeline.h"
+#include "support/expected_timeline.h"
+#include "support/files.h"
 #include "support/package.h"
+#include "support/simulation.h"
 
 namespace {
 
@@ -18,13 +19,13 @@ void WriteJar(const std::string& path) {
   PackageOptions options;
   options.android_manifest = Bytes();
   options.entries = {{"classes.dex", ToBytes("dex\n035")}};
-  SignPackage(options).WriteTo(path);
+  MakePackage(options).WriteTo(path);
 }
 
 // A folder on a file system that keeps extended attributes of users.
 std::string PlaceForAttributes() {
   for (const char* place : {"/tmp", "/var/tmp", "/dev/shm", "."}) {
-    const Folder folder(place);
+    const TempDir folder(place);
     const std::string file = folder.Write("probe", {});
     if (setxattr(file.c_str(), "user.zu", "1", 1, 0) == 0) return place;
   }
@@ -74,7 +75,7 @@ std::string RegisteredJar(const std::string& path) {
 }
 
 TEST(Jar, TrustedIsSignedWithAnEmptyPayload) {
-  const Folder folder;
+  const TempDir folder;
   const std::string jar = folder / "framework.jar";
   WriteJar(jar);
 
@@ -91,7 +92,7 @@ TEST(Jar, TrustedIsSignedWithAnEmptyPayload) {
 }
 
 TEST(Jar, NotTrustedIsNotSigned) {
-  const Folder folder;
+  const TempDir folder;
   const std::string jar = folder / "framework.jar";
   WriteJar(jar);
 
@@ -102,7 +103,7 @@ TEST(Jar, NotTrustedIsNotSigned) {
 }
 
 TEST(Jar, TheKernelsReasonIsLogged) {
-  const Folder folder;
+  const TempDir folder;
   const std::string jar = folder / "framework.jar";
   WriteJar(jar);
 
@@ -113,7 +114,7 @@ TEST(Jar, TheKernelsReasonIsLogged) {
 }
 
 TEST(Jar, TrustedWithTheAttributeIsSignedAndRegisteredUnderItsPath) {
-  const Folder folder(PlaceForAttributes());
+  const TempDir folder(PlaceForAttributes());
   const std::string jar = folder / "framework.jar";
   WriteJar(jar);
   SetAttribute(jar, "1");
@@ -125,7 +126,7 @@ TEST(Jar, TrustedWithTheAttributeIsSignedAndRegisteredUnderItsPath) {
 }
 
 TEST(Jar, NotTrustedWithTheAttributeIsRegisteredAllTheSame) {
-  const Folder folder(PlaceForAttributes());
+  const TempDir folder(PlaceForAttributes());
   const std::string jar = folder / "framework.jar";
   WriteJar(jar);
   SetAttribute(jar, "1");
@@ -137,7 +138,7 @@ TEST(Jar, NotTrustedWithTheAttributeIsRegisteredAllTheSame) {
 }
 
 TEST(Jar, WithAnEmptyAttributeIsNotRegistered) {
-  const Folder folder(PlaceForAttributes());
+  const TempDir folder(PlaceForAttributes());
   const std::string jar = folder / "framework.jar";
   WriteJar(jar);
   SetAttribute(jar, "");
@@ -149,7 +150,7 @@ TEST(Jar, WithAnEmptyAttributeIsNotRegistered) {
 }
 
 TEST(Jar, RefusedRegistrationIsLogged) {
-  const Folder folder(PlaceForAttributes());
+  const TempDir folder(PlaceForAttributes());
   const std::string jar = folder / "framework.jar";
   WriteJar(jar);
   SetAttribute(jar, "1");
@@ -164,7 +165,7 @@ TEST(Jar, RefusedRegistrationIsLogged) {
 }
 
 TEST(Jar, RefusedSignatureIsLogged) {
-  const Folder folder;
+  const TempDir folder;
   const std::string jar = folder / "framework.jar";
   WriteJar(jar);
 
@@ -180,11 +181,11 @@ TEST(Jar, RefusedSignatureIsLogged) {
 }
 
 TEST(Jar, TamperedSignatureDoesNotMatterToOneThatIsTrusted) {
-  const Folder folder;
+  const TempDir folder;
   const std::string jar = folder / "framework.jar";
   PackageOptions options;
   options.android_manifest = Bytes();
-  Package package = SignPackage(options);
+  Package package = MakePackage(options);
   package.Tamper(kManifestName);
   package.WriteTo(jar);
 
@@ -204,7 +205,7 @@ std::string NotAnArchive(const std::string& path, const std::string& reason) {
 }
 
 TEST(OtherFile, ThatIsNoArchiveIsRefusedByEachStep) {
-  const Folder folder;
+  const TempDir folder;
   const std::string file = folder.Write("notes.txt", Bytes(1000, 'x'));
 
   const Simulation run = Simulate(file, {"--trust", file});
@@ -214,7 +215,7 @@ TEST(OtherFile, ThatIsNoArchiveIsRefusedByEachStep) {
 }
 
 TEST(OtherFile, ThatIsEmptyIsRefusedByEachStep) {
-  const Folder folder;
+  const TempDir folder;
   const std::string file = folder.Write("empty.apk", {});
 
   const Simulation run = Simulate(file, {"--trust", file});
@@ -225,7 +226,7 @@ TEST(OtherFile, ThatIsEmptyIsRefusedByEachStep) {
 
 // The end-of-central-directory record alone.
 TEST(OtherFile, ThatIsAnArchiveWithoutEntriesIsRefusedByEachStep) {
-  const Folder folder;
+  const TempDir folder;
   const std::string file = folder.Write("empty.zip", BuildZip({}));
 
   const Simulation run = Simulate(file, {"--trust", file});
@@ -235,7 +236,7 @@ TEST(OtherFile, ThatIsAnArchiveWithoutEntriesIsRefusedByEachStep) {
 }
 
 TEST(OtherFile, WithTheAttributeButNoArchiveIsNotRegistered) {
-  const Folder folder(PlaceForAttributes());
+  const TempDir folder(PlaceForAttributes());
   const std::string file = folder.Write("notes.txt", Bytes(1000, 'x'));
   SetAttribute(file, "1");
 
@@ -246,7 +247,7 @@ TEST(OtherFile, WithTheAttributeButNoArchiveIsNotRegistered) {
 }
 
 TEST(OtherFile, ThatIsADirectoryIsRefusedByEachStep) {
-  const Folder folder;
+  const TempDir folder;
 
   const Simulation run = Simulate(folder.path());
 

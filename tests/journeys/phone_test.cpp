@@ -5,9 +5,10 @@
 #include <cstring>
 #include <regex>
 
-#include "journeys/simulation.h"
-#include "journeys/timeline.h"
+#include "support/expected_timeline.h"
+#include "support/files.h"
 #include "support/package.h"
+#include "support/simulation.h"
 
 namespace {
 
@@ -16,7 +17,7 @@ class GoodPackageOn : public testing::Test {
   GoodPackageOn() {
     PackageOptions options;
     options.secure_storage = true;
-    SignPackage(options).WriteTo(apk_);
+    MakePackage(options).WriteTo(apk_);
   }
 
   // The end of every timeline when libzu is healthy.
@@ -25,7 +26,7 @@ class GoodPackageOn : public testing::Test {
                      Log(4, "ZuAddCertificate: ZuNewCertificate return 0.\n"), Exit(0)});
   }
 
-  const Folder folder_;
+  const TempDir folder_;
   const std::string apk_ = folder_ / "base.apk";
   const std::string library_ = folder_.Write("lib/arm64/libfoo.so", ToBytes("\177ELF foo"));
 };

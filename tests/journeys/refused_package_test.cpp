@@ -5,9 +5,10 @@
 
 #include <filesystem>
 
-#include "journeys/simulation.h"
-#include "journeys/timeline.h"
+#include "support/expected_timeline.h"
+#include "support/files.h"
 #include "support/package.h"
+#include "support/simulation.h"
 
 namespace {
 
@@ -17,7 +18,7 @@ const Bytes kLibrary = ToBytes("\177ELF foo");
 class RefusedPackage : public testing::Test {
  protected:
   explicit RefusedPackage(const PackageOptions& options = Options())
-      : package_(SignPackage(options)) {}
+      : package_(MakePackage(options)) {}
 
   static PackageOptions Options() {
     PackageOptions options;
@@ -70,7 +71,7 @@ class RefusedPackage : public testing::Test {
     EXPECT_EQ(run.status, status);
   }
 
-  const Folder folder_;
+  const TempDir folder_;
   const std::string apk_ = folder_ / "base.apk";
   const std::string library_ = folder_.Write("lib/arm64/libfoo.so", kLibrary);
   Package package_;
@@ -136,7 +137,7 @@ TEST_F(TamperedPackage, DexFileThatClaimsGigabytesIsRefused) {
 }
 
 TEST_F(TamperedPackage, AddedDexFileThatTheManifestDoesNotNameIsRefused) {
-  package_ = SignPackage([] {
+  package_ = MakePackage([] {
     PackageOptions options = Options();
     options.entries = {};
     return options;
@@ -148,7 +149,7 @@ TEST_F(TamperedPackage, AddedDexFileThatTheManifestDoesNotNameIsRefused) {
 
 // Deliberate: other entries are never digested.
 TEST_F(TamperedPackage, SecondDexFileIsNotLookedAt) {
-  package_ = SignPackage([] {
+  package_ = MakePackage([] {
     PackageOptions options;
     options.entries = {{"classes.dex", ToBytes("dex\n035")}, {"classes2.dex", ToBytes("dex\n035")}};
     return options;
@@ -162,7 +163,7 @@ TEST_F(TamperedPackage, SecondDexFileIsNotLookedAt) {
 }
 
 TEST_F(TamperedPackage, CertificateOfAnotherIssuerIsRefused) {
-  package_ = SignPackage([] {
+  package_ = MakePackage([] {
     PackageOptions options = Options();
     // The issuer has the smaller modulus, so that its signature is a number below the other's.
     options.block.key = "rsa-2048-other";
@@ -239,7 +240,7 @@ TEST_F(IncompletePackage, LibraryThatMayNotBeReadIsRefused) {
 }
 
 TEST_F(IncompletePackage, WithoutADigestOfTheLibraryTheLibraryIsRefused) {
-  package_ = SignPackage([] {
+  package_ = MakePackage([] {
     PackageOptions options = Options();
     options.entries = {{"classes.dex", ToBytes("dex\n035")}};
     return options;
@@ -252,7 +253,7 @@ TEST_F(IncompletePackage, WithoutADigestOfTheLibraryTheLibraryIsRefused) {
 }
 
 TEST_F(IncompletePackage, OneRefusedLibraryDoesNotStopTheOther) {
-  package_ = SignPackage([] {
+  package_ = MakePackage([] {
     PackageOptions options;
     options.entries = {{"lib/arm64-v8a/libfoo.so", kLibrary}, {"lib/armeabi/libbar.so", kLibrary}};
     return options;

@@ -6,7 +6,9 @@
 
 #include <cstring>
 
+#include "support/files.h"
 #include "support/log_capture.h"
+#include "support/open_package.h"
 #include "support/package.h"
 #include "support/phone.h"
 
@@ -15,28 +17,20 @@ namespace {
 using Events = std::vector<std::string>;
 
 // An archive in memory, opened as the driver does, with the log and the phone ready.
-struct Opened {
-  explicit Opened(const Package& package) : file(package.Build(), "archive"), apk(file.fd()) {
-    log.Clear();
-  }
-  int fd() const { return file.fd(); }
+struct ArchiveOnPhone {
+  explicit ArchiveOnPhone(const Package& package) : open(package), apk(open.apk) { log.Clear(); }
+  int fd() const { return open.file.fd(); }
 
   LogCapture log;
   Phone phone;
-  MemoryFile file;
-  ApkTools::Apk apk;
+  OpenPackage open;
+  ApkTools::Apk& apk;
 };
 
 Package SecureStoragePackage() {
   PackageOptions options;
   options.secure_storage = true;
-  return SignPackage(options);
-}
-
-Package PlainJar() {
-  PackageOptions options;
-  options.android_manifest = Bytes();
-  return SignPackage(options);
+  return MakePackage(options);
 }
 
 std::string RegisterPackage(int fd) {
@@ -55,21 +49,21 @@ std::string RegisterJar(int fd, const std::string& path) {
 }
 
 TEST(ZuSign, APackageWithoutThePermissionIsLeftAlone) {
-  Opened file(SignPackage());
+  ArchiveOnPhone file(MakePackage());
   ZuSign(file.apk, file.fd(), file.fd());
   EXPECT_EQ(file.phone.events, Events());
   EXPECT_EQ(file.log.records(), Records());
 }
 
 TEST(ZuSign, APackageWithThePermissionIsRegisteredUnderItsNameWithItsSignersKey) {
-  Opened file(SecureStoragePackage());
+  ArchiveOnPhone file(SecureStoragePackage());
   ZuSign(file.apk, file.fd(), file.fd());
   EXPECT_EQ(file.phone.events, Events({RegisterPackage(file.fd())}));
   EXPECT_EQ(file.log.records(), Records({Info("ZuAddCertificate: ZuNewCertificate return 0.\n")}));
 }
 
 TEST(ZuSign, TheSecondResultOfSuccessIsLoggedAsSuccess) {
-  Opened file(SecureStoragePackage());
+  ArchiveOnPhone file(SecureStoragePackage());
   file.phone.zu_result = 0x10004;
   ZuSign(file.apk, file.fd(), file.fd());
   EXPECT_EQ(file.phone.events, Events({RegisterPackage(file.fd())}));
@@ -79,7 +73,7 @@ TEST(ZuSign, TheSecondResultOfSuccessIsLoggedAsSuccess) {
 
 TEST(ZuSign, EveryOtherResultIsAFailure) {
   for (const int result : {1, -1, 0x10000, 0x10003, 0x10005}) {
-    Opened file(SecureStoragePackage());
+    ArchiveOnPhone file(SecureStoragePackage());
     file.phone.zu_result = result;
     ZuSign(file.apk, file.fd(), file.fd());
     EXPECT_EQ(file.log.records(), Records({Error("ZuAddCertificate: ZuNewCertificate failed " +
@@ -88,7 +82,7 @@ TEST(ZuSign, EveryOtherResultIsAFailure) {
 }
 
 TEST(ZuSign, TheRegistrationIsMadeForTheSecondDescriptor) {
-  Opened file(SecureStoragePackage());
+  ArchiveOnPhone file(SecureStoragePackage());
   ZuSign(file.apk, file.fd(), 0);
   EXPECT_EQ(file.phone.events, Events({RegisterPackage(0)}));
 }
@@ -97,18 +91,18 @@ TEST(ZuSign, APackageWithThePermissionThatTurnedBadIsNotRegistered) {
   // The permission is known only of a package whose manifest verified; its dex file is bad.
   Package package = SecureStoragePackage();
   package.Tamper("classes.dex");
-  Opened file(package);
+  ArchiveOnPhone file(package);
   EXPECT_FALSE(file.apk.IsGoodApk());
   file.log.Clear();
   ZuSign(file.apk, 77, 78);
   EXPECT_EQ(file.phone.events, Events());
   EXPECT_EQ(file.log.records(),
             Records({Error("Apk archive is not valid for fd=" + std::to_string(file.fd()) +
-                           ", path=/memfd:archive (deleted)\n")}));
+                           ", path=/memfd:test (deleted)\n")}));
 }
 
 TEST(ZuSign, APackageWhoseSecondDescriptorHasNoPathIsReportedAndRegistered) {
-  Opened file(SecureStoragePackage());
+  ArchiveOnPhone file(SecureStoragePackage());
   file.phone.nameless_fds = {file.fd()};
   const std::string fd = std::to_string(file.fd());
   ZuSign(file.apk, file.fd(), file.fd());
@@ -118,14 +112,14 @@ TEST(ZuSign, APackageWhoseSecondDescriptorHasNoPathIsReportedAndRegistered) {
 }
 
 TEST(ZuSign, AJarWithoutTheAttributeIsLeftAlone) {
-  Opened file(PlainJar());
+  ArchiveOnPhone file(MakePackage(PlainJar()));
   ZuSign(file.apk, file.fd(), file.fd());
   EXPECT_EQ(file.phone.events, Events());
   EXPECT_EQ(file.log.records(), Records());
 }
 
 TEST(ZuSign, AJarWithAnEmptyAttributeIsLeftAlone) {
-  Opened file(PlainJar());
+  ArchiveOnPhone file(MakePackage(PlainJar()));
   file.phone.zu_attribute_size = 0;
   ZuSign(file.apk, file.fd(), file.fd());
   EXPECT_EQ(file.phone.events, Events());
@@ -133,16 +127,16 @@ TEST(ZuSign, AJarWithAnEmptyAttributeIsLeftAlone) {
 }
 
 TEST(ZuSign, AJarWithTheAttributeIsRegisteredUnderItsPathWithFourChainedDigests) {
-  Opened file(PlainJar());
+  ArchiveOnPhone file(MakePackage(PlainJar()));
   file.phone.zu_attribute_size = 1;
   ZuSign(file.apk, file.fd(), file.fd());
-  EXPECT_EQ(file.phone.events, Events({RegisterJar(file.fd(), "/memfd:archive (deleted)")}));
+  EXPECT_EQ(file.phone.events, Events({RegisterJar(file.fd(), "/memfd:test (deleted)")}));
   EXPECT_EQ(file.log.records(), Records({Info("ZuAddCertificate: Call ZuNewCertificate for JAR.\n"),
                                          Info("ZuAddCertificate: ZuNewCertificate return 0.\n")}));
 }
 
 TEST(ZuSign, TheKeyBlockOfAJarIs128Bytes) {
-  Opened file(PlainJar());
+  ArchiveOnPhone file(MakePackage(PlainJar()));
   file.phone.zu_attribute_size = 1;
   ZuSign(file.apk, file.fd(), file.fd());
   ASSERT_EQ(file.phone.events.size(), 1U);
@@ -151,7 +145,7 @@ TEST(ZuSign, TheKeyBlockOfAJarIs128Bytes) {
 }
 
 TEST(ZuSign, AJarWithoutAPathIsReportedAndNotRegistered) {
-  Opened file(PlainJar());
+  ArchiveOnPhone file(MakePackage(PlainJar()));
   file.phone.zu_attribute_size = 1;
   file.phone.nameless_fds = {file.fd()};
   ZuSign(file.apk, file.fd(), 0);
@@ -161,18 +155,18 @@ TEST(ZuSign, AJarWithoutAPathIsReportedAndNotRegistered) {
 }
 
 TEST(ZuSign, AJarWhoseSecondDescriptorHasNoPathIsReportedAndRegistered) {
-  Opened file(PlainJar());
+  ArchiveOnPhone file(MakePackage(PlainJar()));
   file.phone.zu_attribute_size = 1;
   file.phone.nameless_fds = {78};
   ZuSign(file.apk, file.fd(), 78);
-  EXPECT_EQ(file.phone.events, Events({RegisterJar(78, "/memfd:archive (deleted)")}));
+  EXPECT_EQ(file.phone.events, Events({RegisterJar(78, "/memfd:test (deleted)")}));
   EXPECT_EQ(file.log.records(), Records({Error("Can't get oat location from fd=78\n"),
                                          Info("ZuAddCertificate: Call ZuNewCertificate for JAR.\n"),
                                          Info("ZuAddCertificate: ZuNewCertificate return 0.\n")}));
 }
 
 TEST(ZuSign, TheRefusalOfAJarIsReported) {
-  Opened file(PlainJar());
+  ArchiveOnPhone file(MakePackage(PlainJar()));
   file.phone.zu_attribute_size = 1;
   file.phone.zu_result = 5;
   ZuSign(file.apk, file.fd(), file.fd());

@@ -11,10 +11,10 @@
 #include <cstring>
 
 #include "sign/integrity.h"
+#include "support/files.h"
 #include "support/log_capture.h"
 #include "support/package.h"
 #include "support/phone.h"
-#include "support/temp_dir.h"
 
 namespace {
 
@@ -36,22 +36,20 @@ std::string SignEvent(int fd) { return "sign " + std::to_string(fd) + " " + Pack
 ZipItem Library(const std::string& name) { return {name, ToBytes("\177ELF " + name)}; }
 
 // A package in a folder of its own, opened as the driver does, with the log and the phone ready.
-class Opened {
+class PackageOnPhone {
  public:
-  explicit Opened(const Package& package, const std::string& directory = "")
+  explicit PackageOnPhone(const Package& package, const std::string& directory = "")
       : path_(temp_.File(directory + "base.apk")) {
     package.WriteTo(path_);
     fd_ = open(path_.c_str(), O_RDONLY);
     apk_.emplace(fd_);
     log.Clear();
   }
-  ~Opened() { close(fd_); }
+  ~PackageOnPhone() { close(fd_); }
 
   // Puts the item's bytes on disk, at `path` in the package's folder.
-  void Install(const std::string& path, const ZipItem& item) const {
-    WriteFile(temp_.File(path), item.data);
-  }
-  std::string Path(const std::string& path) const { return temp_.path() + "/" + path; }
+  void Install(const std::string& path, const ZipItem& item) const { temp_.Write(path, item.data); }
+  std::string Path(const std::string& path) const { return temp_ / path; }
 
   uint32_t SignJni() { return VeltSignJni(*apk_, fd_, "not used"); }
   uint32_t Sign() { return VeltSign(*apk_, fd_, fd_); }
@@ -70,21 +68,8 @@ class Opened {
   std::optional<ApkTools::Apk> apk_;
 };
 
-PackageOptions WithLibraries(const std::vector<ZipItem>& libraries) {
-  PackageOptions options;
-  options.entries = {{"classes.dex", ToBytes("dex\n035")}};
-  options.entries.insert(options.entries.end(), libraries.begin(), libraries.end());
-  return options;
-}
-
-PackageOptions PlainJar() {
-  PackageOptions options;
-  options.android_manifest = Bytes();
-  return options;
-}
-
 Package BadPackage() {
-  Package package = SignPackage();
+  Package package = MakePackage();
   package.Tamper(kManifestName);
   return package;
 }
@@ -99,7 +84,7 @@ LogRecord SignStarts(int fd) {
 // --- VeltSign -----------------------------------------------------------------------------------
 
 TEST(VeltSign, AGoodPackageIsSignedWithTheDigestOfItsSignersKey) {
-  Opened file(SignPackage());
+  PackageOnPhone file(MakePackage());
   EXPECT_EQ(file.Sign(), 0U);
   EXPECT_EQ(file.phone.events, Events({kSelf, SignEvent(file.fd())}));
   EXPECT_EQ(file.log.records(), Records({SignStarts(file.fd()), Info("VeltSignOat: Apk case.\n"),
@@ -107,7 +92,7 @@ TEST(VeltSign, AGoodPackageIsSignedWithTheDigestOfItsSignersKey) {
 }
 
 TEST(VeltSign, ThePayloadOfAPackageIs34BytesThatStartWith32And0) {
-  Opened file(SignPackage());
+  PackageOnPhone file(MakePackage());
   file.Sign();
   ASSERT_EQ(file.phone.events.size(), 2U);
   const std::string& event = file.phone.events[1];
@@ -117,7 +102,7 @@ TEST(VeltSign, ThePayloadOfAPackageIs34BytesThatStartWith32And0) {
 }
 
 TEST(VeltSign, TheDescriptorForMessagesIsNotTheOneThatIsSigned) {
-  Opened file(SignPackage());
+  PackageOnPhone file(MakePackage());
   EXPECT_EQ(VeltSign(file.apk(), 77, file.fd()), 0U);
   EXPECT_EQ(file.phone.events, Events({kSelf, SignEvent(file.fd())}));
   EXPECT_EQ(file.log.records()[0],
@@ -125,7 +110,7 @@ TEST(VeltSign, TheDescriptorForMessagesIsNotTheOneThatIsSigned) {
 }
 
 TEST(VeltSign, APackageThatDidNotVerifyIsNotSignedAndGetsNoMessageOfItsOwn) {
-  Opened file(BadPackage());
+  PackageOnPhone file(BadPackage());
   EXPECT_EQ(file.Sign(), kVeltFailure);
   EXPECT_EQ(file.phone.events, Events());
   EXPECT_EQ(file.log.records(), Records({SignStarts(file.fd()), Info("VeltSignOat: Apk case.\n"),
@@ -147,7 +132,7 @@ TEST(VeltSign, AFileThatIsNoZipArchiveIsRefused) {
 }
 
 TEST(VeltSign, ARefusalOfTheKernelIsReportedWithItsErrno) {
-  Opened file(SignPackage());
+  PackageOnPhone file(MakePackage());
   file.phone.sign_errno = EPERM;
   EXPECT_EQ(file.Sign(), kVeltFailure);
   EXPECT_EQ(file.phone.events, Events({kSelf, SignEvent(file.fd())}));
@@ -159,7 +144,7 @@ TEST(VeltSign, ARefusalOfTheKernelIsReportedWithItsErrno) {
 }
 
 TEST(VeltSign, ATrustedJarIsSignedWithAnEmptyPayload) {
-  Opened file(SignPackage(PlainJar()));
+  PackageOnPhone file(MakePackage(PlainJar()));
   EXPECT_EQ(file.Sign(), 0U);
   const std::string fd = std::to_string(file.fd());
   EXPECT_EQ(file.phone.events, Events({"verify " + fd, kSelf, "sign " + fd + " 0000"}));
@@ -169,14 +154,14 @@ TEST(VeltSign, ATrustedJarIsSignedWithAnEmptyPayload) {
 }
 
 TEST(VeltSign, AJarIsVerifiedByItsOwnDescriptorAndSignedByTheOther) {
-  Opened file(SignPackage(PlainJar()));
+  PackageOnPhone file(MakePackage(PlainJar()));
   EXPECT_EQ(VeltSign(file.apk(), file.fd(), 77), 0U);
   EXPECT_EQ(file.phone.events,
             Events({"verify " + std::to_string(file.fd()), kSelf, "sign 77 0000"}));
 }
 
 TEST(VeltSign, AJarThatTheKernelDoesNotTrustIsReportedAtInfoLevelAndNotSigned) {
-  Opened file(SignPackage(PlainJar()));
+  PackageOnPhone file(MakePackage(PlainJar()));
   file.phone.verify_errno = ENOKEY;
   EXPECT_EQ(file.Sign(), kVeltFailure);
   EXPECT_EQ(file.phone.events, Events({"verify " + std::to_string(file.fd())}));
@@ -187,7 +172,7 @@ TEST(VeltSign, AJarThatTheKernelDoesNotTrustIsReportedAtInfoLevelAndNotSigned) {
 }
 
 TEST(VeltSign, ATrustedJarThatTheKernelDoesNotSignIsReported) {
-  Opened file(SignPackage(PlainJar()));
+  PackageOnPhone file(MakePackage(PlainJar()));
   file.phone.sign_errno = EROFS;
   EXPECT_EQ(file.Sign(), kVeltFailure);
   EXPECT_EQ(file.log.records(),
@@ -201,7 +186,7 @@ TEST(VeltSign, ATrustedJarThatTheKernelDoesNotSignIsReported) {
 
 TEST(VeltSignJni, ALibraryIsSignedOnItsOwnDescriptorWithThePayloadOfThePackage) {
   const ZipItem library = Library("lib/arm64-v8a/libfoo.so");
-  Opened file(SignPackage(WithLibraries({library})));
+  PackageOnPhone file(MakePackage(WithLibraries({library})));
   file.Install("lib/arm64/libfoo.so", library);
   EXPECT_EQ(file.SignJni(), 0U);
   // The library's descriptor is the lowest free one, the one after the package's.
@@ -212,14 +197,14 @@ TEST(VeltSignJni, ALibraryIsSignedOnItsOwnDescriptorWithThePayloadOfThePackage) 
 
 TEST(VeltSignJni, TheDescriptorOfALibraryIsClosed) {
   const ZipItem library = Library("lib/arm64-v8a/libfoo.so");
-  Opened file(SignPackage(WithLibraries({library})));
+  PackageOnPhone file(MakePackage(WithLibraries({library})));
   file.Install("lib/arm64/libfoo.so", library);
   file.SignJni();
   EXPECT_EQ(fcntl(file.fd() + 1, F_GETFD), -1);
 }
 
 TEST(VeltSignJni, APackageWithoutLibrariesSignsNothing) {
-  Opened file(SignPackage(WithLibraries({})));
+  PackageOnPhone file(MakePackage(WithLibraries({})));
   EXPECT_EQ(file.SignJni(), 0U);
   EXPECT_EQ(file.phone.events, Events());
   EXPECT_EQ(file.log.records(), Records({Starts(file.fd()), Finished()}));
@@ -227,7 +212,7 @@ TEST(VeltSignJni, APackageWithoutLibrariesSignsNothing) {
 
 TEST(VeltSignJni, AnEntryOfNoRowIsPassedOverWithoutAMessage) {
   const ZipItem library = Library("lib/x86/libfoo.so");
-  Opened file(SignPackage(WithLibraries({library})));
+  PackageOnPhone file(MakePackage(WithLibraries({library})));
   file.Install("lib/x86/libfoo.so", library);
   EXPECT_EQ(file.SignJni(), 0U);
   EXPECT_EQ(file.phone.events, Events());
@@ -237,7 +222,7 @@ TEST(VeltSignJni, AnEntryOfNoRowIsPassedOverWithoutAMessage) {
 // Signs the entry when it lies at `installed`; true when the kernel was asked to sign it.
 bool IsFoundAt(const std::string& entry, const std::string& installed) {
   const ZipItem library = Library(entry);
-  Opened file(SignPackage(WithLibraries({library})));
+  PackageOnPhone file(MakePackage(WithLibraries({library})));
   file.Install(installed, library);
   file.SignJni();
   return file.phone.events == Events({kSelf, SignEvent(file.fd() + 1)});
@@ -264,7 +249,7 @@ TEST(VeltSignJni, TheDirectoryTableComparesPlainPrefixes) {
 TEST(VeltSignJni, TwoAbisOfOneDirectoryAreBothSigned) {
   const ZipItem first = Library("lib/armeabi-v7a/libfoo.so");
   const ZipItem second = Library("lib/armeabi/libbar.so");
-  Opened file(SignPackage(WithLibraries({first, second})));
+  PackageOnPhone file(MakePackage(WithLibraries({first, second})));
   file.Install("lib/arm/libfoo.so", first);
   file.Install("lib/arm/libbar.so", second);
   file.SignJni();
@@ -275,7 +260,7 @@ TEST(VeltSignJni, TwoAbisOfOneDirectoryAreBothSigned) {
 TEST(VeltSignJni, APackagePathWithoutASlashLooksInTheWorkingDirectory) {
   const ZipItem library = Library("lib/armeabi-v7a/libfoo.so");
   TempDir temp;
-  const MemoryFile archive(SignPackage(WithLibraries({library})).Build());
+  const MemoryFile archive(MakePackage(WithLibraries({library})).Build());
   WriteFile(temp.File("lib/arm/libfoo.so"), library.data);
   ASSERT_EQ(chdir(temp.path().c_str()), 0);
   LogCapture log;
@@ -292,7 +277,7 @@ TEST(VeltSignJni, APackagePathWithoutASlashLooksInTheWorkingDirectory) {
 }
 
 TEST(VeltSignJni, APackageThatDidNotVerifySignsNoLibrary) {
-  Opened file(BadPackage());
+  PackageOnPhone file(BadPackage());
   file.Install("lib/arm64/libfoo.so", {"", ToBytes("\177ELF foo")});
   EXPECT_EQ(file.SignJni(), kVeltFailure);
   EXPECT_EQ(file.phone.events, Events());
@@ -304,7 +289,7 @@ TEST(VeltSignJni, APackageThatDidNotVerifySignsNoLibrary) {
 TEST(VeltSignJni, ALibraryWhoseBytesDifferIsNotSignedAndTheOthersAre) {
   const ZipItem good = Library("lib/arm64-v8a/liba.so");
   const ZipItem bad = Library("lib/arm64-v8a/libb.so");
-  Opened file(SignPackage(WithLibraries({good, bad})));
+  PackageOnPhone file(MakePackage(WithLibraries({good, bad})));
   file.Install("lib/arm64/liba.so", good);
   file.Install("lib/arm64/libb.so", {"", ToBytes("\177ELF other bytes")});
   EXPECT_EQ(file.SignJni(), 0U);
@@ -319,7 +304,7 @@ TEST(VeltSignJni, ALibraryWhoseBytesDifferIsNotSignedAndTheOthersAre) {
 }
 
 TEST(VeltSignJni, ALibraryThatIsNotOnDiskIsReportedTwice) {
-  Opened file(SignPackage(WithLibraries({Library("lib/arm64-v8a/libfoo.so")})));
+  PackageOnPhone file(MakePackage(WithLibraries({Library("lib/arm64-v8a/libfoo.so")})));
   EXPECT_EQ(file.SignJni(), 0U);
   const std::string target = file.Path("lib/arm64/libfoo.so");
   EXPECT_EQ(file.phone.events, Events());
@@ -329,10 +314,10 @@ TEST(VeltSignJni, ALibraryThatIsNotOnDiskIsReportedTwice) {
 }
 
 TEST(VeltSignJni, ALibraryThatTheManifestDoesNotListIsNotSigned) {
-  Package package = SignPackage(WithLibraries({}));
+  Package package = MakePackage(WithLibraries({}));
   const ZipItem library = Library("lib/arm64-v8a/libfoo.so");
   package.items.push_back(library);
-  Opened file(package);
+  PackageOnPhone file(package);
   file.Install("lib/arm64/libfoo.so", library);
   EXPECT_EQ(file.SignJni(), 0U);
   EXPECT_EQ(file.phone.events, Events());
@@ -346,7 +331,7 @@ TEST(VeltSignJni, ALibraryThatTheManifestDoesNotListIsNotSigned) {
 
 TEST(VeltSignJni, ARefusalOfTheKernelDoesNotChangeTheResult) {
   const ZipItem library = Library("lib/arm64-v8a/libfoo.so");
-  Opened file(SignPackage(WithLibraries({library})));
+  PackageOnPhone file(MakePackage(WithLibraries({library})));
   file.Install("lib/arm64/libfoo.so", library);
   file.phone.sign_errno = EACCES;
   EXPECT_EQ(file.SignJni(), 0U);
@@ -360,7 +345,7 @@ TEST(VeltSignJni, ARefusalOfTheKernelDoesNotChangeTheResult) {
 // that succeeds.
 TEST(VeltSignJni, ALibraryThatCannotBeOpenedAfterItsCheckIsReportedWithItsErrno) {
   const ZipItem library = Library("lib/arm64-v8a/libfoo.so");
-  Opened file(SignPackage(WithLibraries({library})));
+  PackageOnPhone file(MakePackage(WithLibraries({library})));
   file.Install("lib/arm64/libfoo.so", library);
   file.phone.opens_before_failure = 1;
   EXPECT_EQ(file.SignJni(), 0U);

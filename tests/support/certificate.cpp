@@ -20,12 +20,15 @@ struct DigestFacts {
   int nid;
   const char* oid;
   const char* rsa_oid;
+  const char* info_prefix;  // what precedes the digest in a DigestInfo
 };
 
 constexpr DigestFacts kDigests[] = {
-    {EVP_md5, NID_md5, "1.2.840.113549.2.5", "1.2.840.113549.1.1.4"},
-    {EVP_sha1, NID_sha1, "1.3.14.3.2.26", "1.2.840.113549.1.1.5"},
-    {EVP_sha256, NID_sha256, "2.16.840.1.101.3.4.2.1", "1.2.840.113549.1.1.11"},
+    {EVP_md5, NID_md5, "1.2.840.113549.2.5", "1.2.840.113549.1.1.4",
+     "3020300c06082a864886f70d020505000410"},
+    {EVP_sha1, NID_sha1, "1.3.14.3.2.26", "1.2.840.113549.1.1.5", "3021300906052b0e03021a05000414"},
+    {EVP_sha256, NID_sha256, "2.16.840.1.101.3.4.2.1", "1.2.840.113549.1.1.11",
+     "3031300d060960864801650304020105000420"},
 };
 
 const DigestFacts& Facts(Digest digest) { return kDigests[static_cast<int>(digest)]; }
@@ -60,6 +63,13 @@ Bytes SignWith(const std::string& key, Digest digest, const Bytes& data) {
   if (done != 1) abort();
   signature.resize(length);
   return signature;
+}
+
+Bytes EncodedMessage(Digest digest, const Bytes& data, size_t size) {
+  const Bytes digest_info = Concat({FromHex(Facts(digest).info_prefix), DigestOf(digest, data)});
+  if (digest_info.size() + 3 > size) return {};
+  const Bytes padding(size - 3 - digest_info.size(), 0xff);
+  return Concat({{0, 1}, padding, {0}, digest_info});
 }
 
 Bytes AlgorithmIdentifier(const std::string& oid, const Bytes& parameters) {

@@ -21,6 +21,9 @@ Bytes DigestOf(Digest digest, const Bytes& data);
 // PKCS#1 v1.5 signature by the RSA test key `key` (support/keys.h) over `data`; by an EC key, the
 // ECDSA signature.
 Bytes SignWith(const std::string& key, Digest digest, const Bytes& data);
+// The encoded message of the data (RFC 8017 §9.2), which a signature is the root of, in `size`
+// bytes: with as much padding as there is room for, be it none; empty when it does not fit.
+Bytes EncodedMessage(Digest digest, const Bytes& data, size_t size);
 // AlgorithmIdentifier with NULL parameters, or with those given.
 Bytes AlgorithmIdentifier(const std::string& oid, const Bytes& parameters = der::Null());
 // SubjectPublicKeyInfo of the test key, and one that holds any RSAPublicKey or other contents.

@@ -3,24 +3,6 @@
 #include <algorithm>
 #include <sstream>
 
-Bytes Concat(const std::vector<Bytes>& pieces) {
-  Bytes whole;
-  for (const Bytes& piece : pieces) whole.insert(whole.end(), piece.begin(), piece.end());
-  return whole;
-}
-
-Bytes ToBytes(const std::string& text) { return Bytes(text.begin(), text.end()); }
-
-Bytes FromHex(const std::string& digits) {
-  std::string packed = digits;
-  packed.erase(std::remove(packed.begin(), packed.end(), ' '), packed.end());
-  Bytes bytes;
-  for (size_t i = 0; i + 1 < packed.size(); i += 2) {
-    bytes.push_back(static_cast<uint8_t>(std::stoul(packed.substr(i, 2), nullptr, 16)));
-  }
-  return bytes;
-}
-
 namespace der {
 
 Bytes Element(uint8_t identifier, const Bytes& contents) {

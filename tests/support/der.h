@@ -6,14 +6,7 @@
 #include <string>
 #include <vector>
 
-using Bytes = std::vector<uint8_t>;
-
-// The pieces, one after the other.
-Bytes Concat(const std::vector<Bytes>& pieces);
-// The characters, as bytes.
-Bytes ToBytes(const std::string& text);
-// The bytes that the hexadecimal digits stand for; spaces are ignored.
-Bytes FromHex(const std::string& digits);
+#include "support/bytes.h"
 
 namespace der {
 

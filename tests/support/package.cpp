@@ -2,15 +2,13 @@
 
 #include <openssl/bn.h>
 #include <openssl/rsa.h>
-#include <sys/mman.h>
-#include <unistd.h>
 
 #include <algorithm>
 #include <cstdio>
 #include <cstdlib>
-#include <fstream>
 
 #include "support/compiled_manifest.h"
+#include "support/files.h"
 #include "support/jar.h"
 #include "support/keys.h"
 
@@ -25,7 +23,7 @@ std::string ManifestText(const std::vector<ZipItem>& items,
 
 }  // namespace
 
-Package SignPackage(const PackageOptions& options) {
+Package MakePackage(const PackageOptions& options) {
   Package package;
   const Bytes android_manifest = options.android_manifest.value_or(
       CompiledManifest(options.package_name, options.secure_storage));
@@ -42,6 +40,25 @@ Package SignPackage(const PackageOptions& options) {
   package.items.push_back({options.base_name + ".SF", ToBytes(signature_file)});
   package.items.push_back({options.base_name + options.block_extension, block});
   return package;
+}
+
+PackageOptions PlainJar() {
+  PackageOptions options;
+  options.android_manifest = Bytes();
+  return options;
+}
+
+PackageOptions WithLibraries(const std::vector<ZipItem>& libraries) {
+  PackageOptions options;
+  options.entries = {{"classes.dex", ToBytes("dex\n035")}};
+  options.entries.insert(options.entries.end(), libraries.begin(), libraries.end());
+  return options;
+}
+
+PackageOptions WithManifest(const std::string& text) {
+  PackageOptions options;
+  options.edit_manifest = [=](const std::string&) { return text; };
+  return options;
 }
 
 ZipItem& Package::Item(const std::string& name) {
@@ -71,25 +88,3 @@ Bytes ModulusOf(const std::string& key) {
   BN_bn2bin(modulus, bytes.data());
   return bytes;
 }
-
-void WriteFile(const std::string& path, const Bytes& content) {
-  std::ofstream file(path, std::ios::binary);
-  file.write(reinterpret_cast<const char*>(content.data()),
-             static_cast<std::streamsize>(content.size()));
-  if (!file.flush()) {
-    fprintf(stderr, "cannot write %s\n", path.c_str());
-    abort();
-  }
-}
-
-MemoryFile::MemoryFile(const Bytes& content, const std::string& name)
-    : fd_(memfd_create(name.c_str(), MFD_CLOEXEC)), path_("/memfd:" + name + " (deleted)") {
-  if (fd_ < 0 ||
-      write(fd_, content.data(), content.size()) != static_cast<ssize_t>(content.size()) ||
-      lseek(fd_, 0, SEEK_SET) != 0) {
-    perror("memfd");
-    abort();
-  }
-}
-
-MemoryFile::~MemoryFile() { close(fd_); }

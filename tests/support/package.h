@@ -1,7 +1,7 @@
 // Making whole packages and JARs: entries, the manifest that lists them, the signature file and the
 // signature block.
 //
-// A package is made in two steps, so that a test can come between them: `SignPackage` signs, then
+// A package is made in two steps, so that a test can come between them: `MakePackage` signs, then
 // `Package` gives access to every entry (to tamper with it, remove it or add one), then `Build` or
 // `WriteTo` makes the archive.
 #pragma once
@@ -56,26 +56,14 @@ class Package {
   void WriteTo(const std::string& path) const;
 };
 
-Package SignPackage(const PackageOptions& options = {});
+Package MakePackage(const PackageOptions& options = {});
+
+// What makes a plain JAR: all of it but the Android manifest.
+PackageOptions PlainJar();
+// What makes a package with these entries beside the Android manifest and a dex file.
+PackageOptions WithLibraries(const std::vector<ZipItem>& libraries);
+// What makes a good package with this text for its manifest.
+PackageOptions WithManifest(const std::string& text);
 
 // The big-endian modulus of the RSA test key: the manufacturer key of what is signed with it.
 Bytes ModulusOf(const std::string& key);
-
-void WriteFile(const std::string& path, const Bytes& content);
-
-// A file without a name on disk, for as long as the object lives.
-class MemoryFile {
- public:
-  explicit MemoryFile(const Bytes& content, const std::string& name = "test");
-  ~MemoryFile();
-  MemoryFile(const MemoryFile&) = delete;
-  MemoryFile& operator=(const MemoryFile&) = delete;
-
-  int fd() const { return fd_; }
-  // What its descriptor resolves to.
-  std::string path() const { return path_; }
-
- private:
-  int fd_;
-  std::string path_;
-};

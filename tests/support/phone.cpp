@@ -1,4 +1,5 @@
 #include "support/phone.h"
+#include "support/bytes.h"
 
 #include <fcntl.h>
 #include <sys/types.h>
@@ -54,16 +55,6 @@ int Verify(int fd) {
 
 Phone::Phone() { phone = this; }
 Phone::~Phone() { phone = nullptr; }
-
-std::string Hex(const void* data, size_t length) {
-  std::string text;
-  for (size_t i = 0; i < length; ++i) {
-    char digits[3];
-    snprintf(digits, sizeof(digits), "%02x", static_cast<const uint8_t*>(data)[i]);
-    text += digits;
-  }
-  return text;
-}
 
 extern "C" {
 

@@ -36,10 +36,3 @@ struct Phone {
   // MICROSECONDS", "sign FD PAYLOAD-HEX", "verify FD", "register FD NAME DATA-HEX".
   std::vector<std::string> events;
 };
-
-// The bytes as lower-case hexadecimal digits.
-std::string Hex(const void* data, size_t length);
-template <class Bytes>
-std::string Hex(const Bytes& bytes) {
-  return Hex(bytes.data(), bytes.size());
-}

@@ -11,9 +11,9 @@
 #include "sign/registration.h"
 #include "sign/signing.h"
 #include "support/compiled_manifest.h"
+#include "support/files.h"
 #include "support/package.h"
 #include "support/phone.h"
-#include "support/temp_dir.h"
 
 namespace {
 
@@ -82,33 +82,28 @@ class Device {
   const std::string path_;
 };
 
-PackageOptions WithLibraries(const Strings& names) {
+PackageOptions WithLibrariesNamed(const Strings& names) {
   PackageOptions options;
   options.entries.clear();
   for (const std::string& name : names) options.entries.push_back({name, kLibrary});
   return options;
 }
 
-// The encoded message of RFC 8017 section 9.2 for SHA-256: what a signature is the root of.
-Bytes EncodedMessage(const Bytes& data, size_t size) {
-  const Bytes prefix = FromHex("3031300d060960864801650304020105000420");
-  const Bytes padding(size - 3 - prefix.size() - 32, 0xff);
-  return Concat({{0, 1}, padding, {0}, prefix, DigestOf(Digest::kSha256, data)});
-}
-
 // The package as somebody signs it who knows no more of the key `victim` than everyone does, and
 // writes the encoded messages themselves where signatures belong.
 Package SignedWithoutPrivateKey(const std::string& victim, uint64_t exponent) {
-  Package package = SignPackage();
+  Package package = MakePackage();
   const Bytes modulus = ModulusOf(victim);
   Certificate certificate;
   certificate.public_key_info = PublicKeyInfoAround(
       der::Sequence({der::Integer(Concat({{0}, modulus})), der::Integer(exponent)}));
-  certificate.signature = der::BitString(EncodedMessage(certificate.Tbs(), modulus.size()));
+  certificate.signature =
+      der::BitString(EncodedMessage(Digest::kSha256, certificate.Tbs(), modulus.size()));
   SignatureBlock block;
   block.certificates = certificate.Build();
   const Bytes signature_file = package.Item("META-INF/CERT.SF").data;
-  block.encrypted_digest = der::OctetString(EncodedMessage(signature_file, modulus.size()));
+  block.encrypted_digest =
+      der::OctetString(EncodedMessage(Digest::kSha256, signature_file, modulus.size()));
   package.Item("META-INF/CERT.RSA").data = block.Build(signature_file);
   return package;
 }
@@ -126,26 +121,26 @@ TEST(Threat, AnyOtherExponentAsksForThePrivateKey) {
 }
 
 TEST(Threat, DotsInAnEntryNameReachAFileOutsideWhoseBytesTheManifestLists) {
-  Device device(SignPackage(WithLibraries({"lib/arm64-v8a/../../../other/libfoo.so"})));
+  Device device(MakePackage(WithLibrariesNamed({"lib/arm64-v8a/../../../other/libfoo.so"})));
   device.Install("lib/arm64/x", {}).Install("../other/libfoo.so", kLibrary);
   EXPECT_EQ(device.FilesSignedFor("rsa-2048"), Strings({"other/libfoo.so", "app/base.apk"}));
 }
 
 TEST(Threat, DotsInAnEntryNameSignNoFileOutsideWithOtherBytes) {
-  Device device(SignPackage(WithLibraries({"lib/arm64-v8a/../../../other/libfoo.so"})));
+  Device device(MakePackage(WithLibrariesNamed({"lib/arm64-v8a/../../../other/libfoo.so"})));
   device.Install("lib/arm64/x", {}).Install("../other/libfoo.so", ToBytes("another's"));
   EXPECT_EQ(device.FilesSignedFor("rsa-2048"), Strings({"app/base.apk"}));
 }
 
 TEST(Threat, FileIsReadAndSignedForEachEntryThatNamesIt) {
-  Device device(SignPackage(WithLibraries({"lib/arm64-v8a/a.so", "lib/arm64-v8a/./a.so"})));
+  Device device(MakePackage(WithLibrariesNamed({"lib/arm64-v8a/a.so", "lib/arm64-v8a/./a.so"})));
   device.Install("lib/arm64/a.so", kLibrary);
   EXPECT_EQ(device.FilesSignedFor("rsa-2048"),
             Strings({"app/lib/arm64/a.so", "app/lib/arm64/a.so", "app/base.apk"}));
 }
 
 TEST(Threat, ReplacedAndroidManifestNamesWhatTheSignersKeyIsRegisteredFor) {
-  Package package = SignPackage();
+  Package package = MakePackage();
   package.Item(kAndroidManifestName).data = CompiledManifest("com.example.other", true);
   EXPECT_EQ(Device(package).Registered(),
             Strings({"com.example.other " + Hex(ModulusOf("rsa-2048"))}));
@@ -155,12 +150,12 @@ TEST(Threat, PackageNameIsRegisteredUpToItsFirstNul) {
   PackageOptions options;
   options.package_name = std::string("com.example.app\0.other", 22);
   options.secure_storage = true;
-  EXPECT_EQ(Device(SignPackage(options)).Registered(),
+  EXPECT_EQ(Device(MakePackage(options)).Registered(),
             Strings({"com.example.app " + Hex(ModulusOf("rsa-2048"))}));
 }
 
 TEST(Threat, PackageWhoseAndroidManifestCannotBeExtractedIsAJarThatTheKernelMustTrust) {
-  Package package = SignPackage();
+  Package package = MakePackage();
   ZipItem& manifest = package.Item(kAndroidManifestName);
   manifest = ClaimingLength(manifest, static_cast<uint32_t>(manifest.data.size() + 1));
   EXPECT_EQ(Device(package).FilesSignedWith("0000"), Strings({"app/base.apk"}));

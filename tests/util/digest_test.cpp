@@ -2,30 +2,16 @@
 #include "util/digest.h"
 
 #include <gtest/gtest.h>
-#include <unistd.h>
 
 #include <cstdio>
-#include <cstdlib>
-#include <fstream>
 #include <memory>
 #include <string>
 
+#include "support/files.h"
+
 namespace {
 
-using Bytes = std::vector<uint8_t>;
 using Digest = void (*)(const Bytes&, Bytes&);
-
-Bytes ToBytes(const std::string& text) { return {text.begin(), text.end()}; }
-
-std::string Hex(const Bytes& bytes) {
-  std::string hex;
-  for (const uint8_t byte : bytes) {
-    char digits[3];
-    snprintf(digits, sizeof(digits), "%02x", byte);
-    hex += digits;
-  }
-  return hex;
-}
 
 std::string HexDigest(Digest digest, const std::string& text) {
   Bytes out;
@@ -35,14 +21,11 @@ std::string HexDigest(Digest digest, const std::string& text) {
 
 // What `openssl dgst -NAME` says of `bytes`.
 std::string OpensslDigest(const std::string& name, const Bytes& bytes) {
-  const std::string path = testing::TempDir() + "digest_test." + std::to_string(getpid());
-  std::ofstream(path, std::ios::binary)
-      .write(reinterpret_cast<const char*>(bytes.data()), static_cast<int>(bytes.size()));
-  const std::string command = "openssl dgst -r -" + name + " " + path;
+  const DiskFile file(bytes);
+  const std::string command = "openssl dgst -r -" + name + " " + file.path();
   const std::unique_ptr<FILE, int (*)(FILE*)> pipe(popen(command.c_str(), "r"), pclose);
   char hex[65] = {};
   if (pipe == nullptr || fscanf(pipe.get(), "%64[0-9a-f]", hex) != 1) return "no answer";
-  unlink(path.c_str());
   return hex;
 }
 

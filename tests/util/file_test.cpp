@@ -21,6 +21,7 @@
 #include <string>
 #include <vector>
 
+#include "support/files.h"
 #include "support/log_capture.h"
 
 // What a test has the kernel answer; where nothing is set, the kernel answers itself.
@@ -64,27 +65,18 @@ ssize_t __wrap_readlink(const char* path, char* buffer, size_t size) {
 
 namespace {
 
-using Bytes = std::vector<uint8_t>;
-
 class FileTest : public testing::Test {
  protected:
-  void SetUp() override {
-    std::string name = testing::TempDir() + "file_test.XXXXXX";
-    ASSERT_NE(nullptr, mkdtemp(name.data()));
-    directory_ = std::filesystem::canonical(name);
-    alarm(60);  // whoever waits for a FIFO is ended
-  }
+  void SetUp() override { alarm(60); }  // whoever waits for a FIFO is ended
   void TearDown() override {
     kernel = Kernel();
     alarm(0);
-    std::filesystem::remove_all(directory_);
   }
 
-  std::string Path(const std::string& name) const { return directory_ + "/" + name; }
+  std::string Path(const std::string& name) const { return folder_ / name; }
 
   std::string MakeFile(const std::string& content) const {
-    std::ofstream(Path("file"), std::ios::binary) << content;
-    return Path("file");
+    return folder_.Write("file", ToBytes(content));
   }
 
   // `path` cannot be read, which is told by `message` alone, and `out` stays as it is.
@@ -99,12 +91,10 @@ class FileTest : public testing::Test {
     ExpectRefused(path, "Can't read file: " + path + " (streamoff=-1)\n");
   }
 
-  std::string directory_;
+  TempDir folder_;
 };
 using ReadFileTest = FileTest;
 using GetFilenameByFdTest = FileTest;
-
-Bytes ToBytes(const std::string& text) { return {text.begin(), text.end()}; }
 
 // The number that the next descriptor gets.
 int NextDescriptor() {
@@ -164,7 +154,7 @@ TEST_F(ReadFileTest, SocketCannotBeOpened) {
   close(fd);
 }
 
-TEST_F(ReadFileTest, DirectoryHasNoSize) { ExpectNoSize(directory_); }
+TEST_F(ReadFileTest, DirectoryHasNoSize) { ExpectNoSize(folder_.path()); }
 
 TEST_F(ReadFileTest, DeviceHasNoSize) { ExpectNoSize("/dev/zero"); }
 
@@ -288,7 +278,7 @@ TEST_F(ReadFileTest, NoDescriptorStaysOpen) {
   const int before = NextDescriptor();
   Bytes out;
   EXPECT_TRUE(ReadFile(MakeFile("abc"), out));
-  ExpectNoSize(directory_);
+  ExpectNoSize(folder_.path());
   EXPECT_EQ(before, NextDescriptor());
 }
 
@@ -349,13 +339,13 @@ class DeepDirectory {
 };
 
 TEST_F(GetFilenameByFdTest, TargetPathOf4094BytesIsWhole) {
-  const DeepDirectory deep(directory_, 4094);
+  const DeepDirectory deep(folder_.path(), 4094);
   ASSERT_NE(-1, deep.fd());
   EXPECT_EQ(deep.path(), GetFilenameByFd(deep.fd()));
 }
 
 TEST_F(GetFilenameByFdTest, TargetPathOf4095BytesIsItsFirst4095Bytes) {
-  const DeepDirectory deep(directory_, 4095);
+  const DeepDirectory deep(folder_.path(), 4095);
   ASSERT_NE(-1, deep.fd());
   EXPECT_EQ(4095U, GetFilenameByFd(deep.fd()).size());
   EXPECT_EQ(deep.path(), GetFilenameByFd(deep.fd()));
@@ -363,7 +353,7 @@ TEST_F(GetFilenameByFdTest, TargetPathOf4095BytesIsItsFirst4095Bytes) {
 
 // Linux does not tell a longer path at all: readlink fails with ENAMETOOLONG.
 TEST_F(GetFilenameByFdTest, TargetPathOf4096BytesIsNotToldByTheKernel) {
-  const DeepDirectory deep(directory_, 4096);
+  const DeepDirectory deep(folder_.path(), 4096);
   ASSERT_NE(-1, deep.fd());
   EXPECT_EQ("", GetFilenameByFd(deep.fd()));
 }

@@ -10,8 +10,8 @@
 #include <nlohmann/json.hpp>
 
 #include "crypto/rsa.h"
-#include "journeys/simulation.h"
 #include "support/certificate.h"
+#include "support/process.h"
 
 namespace {
 

@@ -1,0 +1,105 @@
+// The files in which the kernel publishes each task's integrity value: /proc/self/integrity/value
+// and /proc/PID/integrity/value, for whoever opens them through the C library. They can only be
+// read. Each opening, of whichever task's file, answers the next of the phone's integrity values.
+#include <fcntl.h>
+#include <sys/mman.h>
+#include <unistd.h>
+
+#include <algorithm>
+#include <atomic>
+#include <cerrno>
+#include <cstdint>
+#include <cstdio>
+#include <cstdlib>
+#include <cstring>
+#include <optional>
+#include <string>
+#include <vector>
+
+#include "simulator/phone/next_function.h"
+#include "simulator/phone/stand_in.h"
+
+namespace {
+
+using FopenFunction = FILE*(const char*, const char*);
+
+FILE* Fopen(FopenFunction* next, const char* path, const char* mode);
+std::optional<int> TaskOf(const char* path);
+FILE* OpenIntegrity(int pid, const char* mode);
+bool TaskExists(int pid);
+int FileHolding(const std::string& text, bool closes_on_exec);
+
+}  // namespace
+
+STAND_IN FILE* fopen(const char* path, const char* mode) {
+  static auto* const next = NextFunction<FopenFunction>("fopen");
+  return Fopen(next, path, mode);
+}
+
+// What fopen is in programs that are built for large files.
+STAND_IN FILE* fopen64(const char* path, const char* mode) {
+  static auto* const next = NextFunction<FopenFunction>("fopen64");
+  return Fopen(next, path, mode);
+}
+
+namespace {
+
+FILE* Fopen(FopenFunction* next, const char* path, const char* mode) {
+  const auto pid = TaskOf(path);
+  return pid ? OpenIntegrity(*pid, mode) : next(path, mode);
+}
+
+// The task whose integrity file `path` names, 0 for "self"; none when it names another file.
+std::optional<int> TaskOf(const char* path) {
+  constexpr char kBefore[] = "/proc/";
+  constexpr char kAfter[] = "/integrity/value";
+  if (path == nullptr || strncmp(path, kBefore, strlen(kBefore)) != 0) return {};
+  const char* const task = path + strlen(kBefore);
+  const char* const after = strchr(task, '/');
+  if (after == nullptr || strcmp(after, kAfter) != 0) return {};
+  const std::string name(task, after);
+  if (name == "self") return 0;
+  const long pid = strtol(name.c_str(), nullptr, 10);
+  const bool is_pid = pid > 0 && pid <= INT32_MAX && std::to_string(pid) == name;
+  return is_pid ? std::optional<int>(static_cast<int>(pid)) : std::nullopt;
+}
+
+// Opens the integrity file of the task `pid` as fopen does.
+FILE* OpenIntegrity(int pid, const char* mode) {
+  static std::atomic<size_t> opened{0};
+  const auto fail = [](int error) {
+    errno = error;
+    return nullptr;
+  };
+  const bool reads_only = mode[0] == 'r' && strchr(mode, '+') == nullptr;
+  if (!reads_only) return fail(EACCES);
+  if (!TaskExists(pid)) return fail(ENOENT);
+  const std::vector<std::string>& values = ThisPhone().integrity;
+  const std::string& text = values[std::min(opened++, values.size() - 1)];
+  Event event("integrity");
+  event.Number("pid", pid);
+  if (text == kMissing) {
+    Record(event.Null("text"));
+    return fail(ENOENT);
+  }
+  Record(event.Text("text", text));
+  const int fd = FileHolding(text + "\n", strchr(mode, 'e') != nullptr);
+  return fd < 0 ? nullptr : fdopen(fd, mode);
+}
+
+bool TaskExists(int pid) {
+  const ErrnoKeeper keeper;
+  return pid == 0 || access(("/proc/" + std::to_string(pid)).c_str(), F_OK) == 0;
+}
+
+// A file of its own that holds `text`, which can be read and no longer written.
+int FileHolding(const std::string& text, bool closes_on_exec) {
+  const int fd = memfd_create("integrity", MFD_ALLOW_SEALING | (closes_on_exec ? MFD_CLOEXEC : 0U));
+  if (fd < 0) return fd;
+  const ErrnoKeeper keeper;
+  pwrite(fd, text.data(), text.size(), 0);
+  fcntl(fd, F_ADD_SEALS, F_SEAL_WRITE | F_SEAL_GROW | F_SEAL_SHRINK | F_SEAL_SEAL);
+  return fd;
+}
+
+}  // namespace

@@ -1,0 +1,56 @@
+#include "simulator/phone/journal.h"
+
+#include <fcntl.h>
+#include <unistd.h>
+
+#include "simulator/phone/descriptors.h"
+#include "simulator/phone/text.h"
+
+Event::Event(const char* name) : line_("{\"event\":") { line_ += EncodeText(name); }
+
+Event& Event::Number(const char* key, int64_t value) {
+  Key(key);
+  line_ += std::to_string(value);
+  return *this;
+}
+
+Event& Event::Text(const char* key, std::string_view bytes) {
+  Key(key);
+  line_ += EncodeText(bytes);
+  return *this;
+}
+
+Event& Event::Hex(const char* key, std::string_view bytes) {
+  constexpr char kDigits[] = "0123456789abcdef";
+  Key(key);
+  line_ += '"';
+  for (const char byte : bytes) {
+    line_ += kDigits[static_cast<uint8_t>(byte) >> 4];
+    line_ += kDigits[static_cast<uint8_t>(byte) & 15];
+  }
+  line_ += '"';
+  return *this;
+}
+
+Event& Event::Null(const char* key) {
+  Key(key);
+  line_ += "null";
+  return *this;
+}
+
+bool Event::AppendTo(int journal) const {
+  const std::string line = line_ + "}\n";
+  return write(journal, line.data(), line.size()) == static_cast<ssize_t>(line.size());
+}
+
+Event& Event::Key(const char* key) {
+  line_ += ",\"";
+  line_ += key;
+  line_ += "\":";
+  return *this;
+}
+
+int OpenJournal(const char* path) {
+  const int fd = open(path, O_WRONLY | O_CREAT | O_APPEND | O_CLOEXEC, 0666);
+  return fd < 0 ? fd : MoveHigh(fd);
+}

@@ -1,0 +1,37 @@
+// The journal of a simulated run: one JSON object a line, in the order in which things happened
+// (docs/journal.md is its schema). Written by the stand-ins inside the tool and by apktoolkit-sim
+// around it, each line with one appending write, so that the order of the writes is the order of
+// the lines. Needs no JSON library: the stand-ins are to bring nothing into the tool's process.
+#pragma once
+
+#include <cstdint>
+#include <string>
+#include <string_view>
+
+// The version of the schema; the journal's first line carries it.
+inline constexpr int kJournalVersion = 1;
+
+// One line under construction. Keys are plain ASCII names.
+class Event {
+ public:
+  explicit Event(const char* name);
+
+  Event& Number(const char* key, int64_t value);
+  // A text is any bytes (see EncodeText).
+  Event& Text(const char* key, std::string_view bytes);
+  // As lower-case hexadecimal digits.
+  Event& Hex(const char* key, std::string_view bytes);
+  Event& Null(const char* key);
+
+  // Appends the line to the open file `journal`; false when it could not be written whole.
+  bool AppendTo(int journal) const;
+
+ private:
+  Event& Key(const char* key);
+
+  std::string line_;
+};
+
+// Opens the journal at `path` for appending, close-on-exec, and keeps its descriptor out of the
+// way of those that the process opens itself; -1 when it cannot be opened.
+int OpenJournal(const char* path);

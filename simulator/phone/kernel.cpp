@@ -1,0 +1,172 @@
+// The kernel's integrity feature: its two commands, under both names that the C library gives
+// fcntl.
+//
+// This file, integrity_file.cpp, log.cpp and standard_output.cpp are one library that is loaded
+// before all others and takes the place of those functions through which the tool meets a phone.
+// What does not concern the phone goes on to the next function of that name, unchanged.
+#include <fcntl.h>
+#include <sys/mman.h>
+#include <sys/stat.h>
+#include <unistd.h>
+
+#include <algorithm>
+#include <cstdarg>
+#include <cstdint>
+#include <cstdlib>
+#include <cstring>
+#include <mutex>
+#include <string>
+#include <vector>
+
+#include "simulator/phone/descriptors.h"
+#include "simulator/phone/next_function.h"
+#include "simulator/phone/stand_in.h"
+
+namespace {
+
+constexpr int kSignCommand = 1124;
+constexpr int kVerifyCommand = 1125;
+
+using FcntlFunction = int(int, int, ...);
+
+int Fcntl(FcntlFunction* next, int fd, int command, void* argument);
+int Sign(int fd, const void* argument);
+int Verify(int fd);
+int DescriptorError(int fd);
+int CopyPayload(const void* argument, std::string* payload);
+bool CopyIn(const char* from, size_t size, char* to);
+int Scratch();
+void Trust(int fd);
+bool IsTrusted(int fd);
+int Answer(Event* event, int error, int errno_before);
+
+// The journal shows that the stand-ins are in place; the environment no longer does, and what the
+// tool starts goes without them.
+__attribute__((constructor)) void Attach() {
+  const ErrnoKeeper keeper;
+  Record(Event("attached").Number("pid", getpid()));
+  Scratch();
+  unsetenv("LD_PRELOAD");
+}
+
+}  // namespace
+
+STAND_IN int fcntl(int fd, int command, ...) {
+  static FcntlFunction* const next = NextFunction<FcntlFunction>("fcntl");
+  va_list arguments;
+  va_start(arguments, command);
+  void* const argument = va_arg(arguments, void*);
+  va_end(arguments);
+  return Fcntl(next, fd, command, argument);
+}
+
+STAND_IN int fcntl64(int fd, int command, ...) {
+  static FcntlFunction* const next = NextFunction<FcntlFunction>("fcntl64");
+  va_list arguments;
+  va_start(arguments, command);
+  void* const argument = va_arg(arguments, void*);
+  va_end(arguments);
+  return Fcntl(next, fd, command, argument);
+}
+
+namespace {
+
+// Every command takes at most one argument, of a pointer's size at most.
+int Fcntl(FcntlFunction* next, int fd, int command, void* argument) {
+  if (command == kSignCommand) return Sign(fd, argument);
+  if (command == kVerifyCommand) return Verify(fd);
+  return next(fd, command, argument);
+}
+
+int Sign(int fd, const void* argument) {
+  const int errno_before = errno;
+  std::string payload;
+  int error = DescriptorError(fd);
+  if (error == 0) error = CopyPayload(argument, &payload);
+  if (error == 0) error = ThisPhone().sign_errno;
+  if (error == 0) Trust(fd);
+  Event event("sign");
+  event.Number("fd", fd).Text("path", PathOf(fd)).Hex("payload", payload);
+  return Answer(&event, error, errno_before);
+}
+
+int Verify(int fd) {
+  const int errno_before = errno;
+  int error = DescriptorError(fd);
+  if (error == 0 && !IsTrusted(fd)) error = ThisPhone().verify_errno;
+  Event event("verify");
+  event.Number("fd", fd).Text("path", PathOf(fd));
+  return Answer(&event, error, errno_before);
+}
+
+// A descriptor that names a file without having opened it (O_PATH) is none to the kernel here.
+int DescriptorError(int fd) {
+  const int flags = fcntl(fd, F_GETFL);
+  return flags < 0 || (flags & O_PATH) != 0 ? EBADF : 0;
+}
+
+// Copies the payload that starts at `argument`: a 16-bit length in host byte order, then as many
+// bytes. Memory that cannot be read is EFAULT, and `payload` then stays empty.
+int CopyPayload(const void* argument, std::string* payload) {
+  const char* const from = static_cast<const char*>(argument);
+  uint16_t length = 0;
+  char header[sizeof(length)];
+  if (!CopyIn(from, sizeof(header), header)) return EFAULT;
+  memcpy(&length, header, sizeof(length));
+  std::string bytes(sizeof(header) + length, '\0');
+  if (!CopyIn(from, bytes.size(), bytes.data())) return EFAULT;
+  *payload = bytes;
+  return 0;
+}
+
+// As the kernel copies from a process: false, and no signal, where there is nothing to read. The
+// way through a file makes the real kernel do it, and works under an emulator, too.
+bool CopyIn(const char* from, size_t size, char* to) {
+  const ssize_t wanted = static_cast<ssize_t>(size);
+  return pwrite(Scratch(), from, size, 0) == wanted && pread(Scratch(), to, size, 0) == wanted;
+}
+
+int Scratch() {
+  static const int scratch = MoveHigh(memfd_create("payload", MFD_CLOEXEC));
+  return scratch;
+}
+
+// The files that this process had signed.
+struct SignedFiles {
+  std::mutex mutex;
+  std::vector<FileId> ids;
+};
+
+SignedFiles& Signed() {
+  static SignedFiles& files = *new SignedFiles;
+  return files;
+}
+
+FileId IdOf(int fd) {
+  struct stat state = {};
+  fstat(fd, &state);
+  return {state.st_dev, state.st_ino};
+}
+
+void Trust(int fd) {
+  const std::lock_guard<std::mutex> lock(Signed().mutex);
+  Signed().ids.push_back(IdOf(fd));
+}
+
+bool IsTrusted(int fd) {
+  const auto holds = [id = IdOf(fd)](const std::vector<FileId>& ids) {
+    return std::find(ids.begin(), ids.end(), id) != ids.end();
+  };
+  const std::lock_guard<std::mutex> lock(Signed().mutex);
+  return holds(ThisPhone().trusted) || holds(Signed().ids);
+}
+
+// Records what the kernel answers, and answers it.
+int Answer(Event* event, int error, int errno_before) {
+  const int result = error == 0 ? 0 : -1;
+  Record(event->Number("result", result).Number("errno", error));
+  errno = error == 0 ? errno_before : error;
+  return result;
+}
+
+}  // namespace

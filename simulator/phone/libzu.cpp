@@ -1,0 +1,26 @@
+// The stand-in for the closed process-authentication library. The tool is linked against it as it
+// is against the real one.
+#include "sign/libzu.h"
+
+#include <string_view>
+
+#include "simulator/phone/descriptors.h"
+#include "simulator/phone/stand_in.h"
+
+namespace {
+
+// What the tool gets on a workstation, where there is no service to register with.
+constexpr int kNoService = -1;
+
+}  // namespace
+
+STAND_IN int ZuNewCertificate(int fd, const char* name, const unsigned char* data, size_t length) {
+  if (ThisPhone().journal.empty()) return kNoService;
+  const ErrnoKeeper keeper;
+  const int result = ThisPhone().zu_result;
+  const std::string_view bytes(reinterpret_cast<const char*>(data), length);
+  Event event("register");
+  event.Number("fd", fd).Text("path", PathOf(fd)).Text("name", name == nullptr ? "" : name);
+  Record(event.Hex("data", data == nullptr ? "" : bytes).Number("result", result));
+  return result;
+}

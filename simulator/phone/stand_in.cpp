@@ -1,0 +1,27 @@
+#include "simulator/phone/stand_in.h"
+
+namespace {
+
+// Open from the start, so that a process without a free descriptor is recorded all the same.
+int JournalDescriptor() {
+  static const int journal =
+      ThisPhone().journal.empty() ? -1 : OpenJournal(ThisPhone().journal.c_str());
+  return journal;
+}
+
+__attribute__((constructor)) void OpenEarly() {
+  const ErrnoKeeper keeper;
+  JournalDescriptor();
+}
+
+}  // namespace
+
+const PhoneSettings& ThisPhone() {
+  static const PhoneSettings& phone = *new PhoneSettings(SettingsFromEnvironment());
+  return phone;
+}
+
+void Record(const Event& event) {
+  const ErrnoKeeper keeper;
+  if (JournalDescriptor() >= 0) event.AppendTo(JournalDescriptor());
+}

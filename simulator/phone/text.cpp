@@ -1,0 +1,101 @@
+#include "simulator/phone/text.h"
+
+#include <algorithm>
+#include <cstdint>
+#include <cstdio>
+
+namespace {
+
+bool IsPrivateByte(std::string_view character);
+void AppendEscape(unsigned code, std::string* out);
+
+}  // namespace
+
+std::string EncodeText(std::string_view bytes) {
+  std::string out = "\"";
+  while (!bytes.empty()) {
+    const size_t length = Utf8Length(bytes);
+    const std::string_view character = bytes.substr(0, std::max<size_t>(length, 1));
+    const uint8_t first = static_cast<uint8_t>(character[0]);
+    if (length == 0 || IsPrivateByte(character)) {
+      for (const char byte : character) AppendEscape(0xf700U | static_cast<uint8_t>(byte), &out);
+    } else if (first < 0x20 || first == 0x7f) {
+      if (first == '\n') {
+        out += "\\n";
+      } else {
+        AppendEscape(first, &out);
+      }
+    } else {
+      if (first == '"' || first == '\\') out += '\\';
+      out += character;
+    }
+    bytes.remove_prefix(character.size());
+  }
+  return out + '"';
+}
+
+std::string DecodeText(std::string_view utf8) {
+  std::string bytes;
+  while (!utf8.empty()) {
+    const std::string_view character = utf8.substr(0, std::max<size_t>(Utf8Length(utf8), 1));
+    if (IsPrivateByte(character)) {
+      // U+F780 to U+F7FF is EF 9E 80 to EF 9F BF.
+      const unsigned high = static_cast<uint8_t>(character[1]) & 3U;
+      const unsigned low = static_cast<uint8_t>(character[2]) & 0x3fU;
+      bytes += static_cast<char>((high << 6 | low) & 0xffU);
+    } else {
+      bytes += character;
+    }
+    utf8.remove_prefix(character.size());
+  }
+  return bytes;
+}
+
+// Well-formed as RFC 3629 §4 has it: no overlong forms, no surrogates, nothing above U+10FFFF.
+size_t Utf8Length(std::string_view bytes) {
+  const auto byte = [&bytes](size_t i) {
+    return i < bytes.size() ? static_cast<uint8_t>(bytes[i]) : 0U;
+  };
+  const auto is_tail = [&byte](size_t i) { return (byte(i) & 0xc0U) == 0x80; };
+  const unsigned first = byte(0);
+  if (bytes.empty()) return 0;
+  if (first < 0x80) return 1;
+  if (first >= 0xc2 && first <= 0xdf) return is_tail(1) ? 2 : 0;
+  if (first >= 0xe0 && first <= 0xef) {
+    const bool overlong = first == 0xe0 && byte(1) < 0xa0;
+    const bool surrogate = first == 0xed && byte(1) > 0x9f;
+    return is_tail(1) && is_tail(2) && !overlong && !surrogate ? 3 : 0;
+  }
+  if (first >= 0xf0 && first <= 0xf4) {
+    const bool overlong = first == 0xf0 && byte(1) < 0x90;
+    const bool too_high = first == 0xf4 && byte(1) > 0x8f;
+    return is_tail(1) && is_tail(2) && is_tail(3) && !overlong && !too_high ? 4 : 0;
+  }
+  return 0;
+}
+
+std::vector<std::string> Split(const std::string& text, char separator) {
+  std::vector<std::string> parts;
+  size_t start = 0;
+  for (size_t end; (end = text.find(separator, start)) != std::string::npos; start = end + 1) {
+    parts.push_back(text.substr(start, end - start));
+  }
+  parts.push_back(text.substr(start));
+  return parts;
+}
+
+namespace {
+
+// One of the characters U+F780 to U+F7FF, which stand for bytes.
+bool IsPrivateByte(std::string_view character) {
+  return character.size() == 3 && character[0] == '\xef' &&
+         (character[1] == '\x9e' || character[1] == '\x9f');
+}
+
+void AppendEscape(unsigned code, std::string* out) {
+  char escape[8];
+  snprintf(escape, sizeof(escape), "\\u%04x", code);
+  *out += escape;
+}
+
+}  // namespace

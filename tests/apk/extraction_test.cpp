@@ -1,0 +1,131 @@
+// What is believed of an entry's lengths before memory is made for it.
+#include "apk/extraction.h"
+
+#include <gtest/gtest.h>
+#include <sys/mman.h>
+
+#include <cerrno>
+
+#include "apk/open_entry.h"
+
+using namespace ApkTools;
+
+// The linker sends the tool's calls of mmap here, and with them its question whether there is
+// memory to be had.
+static bool memory_is_short = false;
+
+extern "C" void* __real_mmap(void* address, size_t size, int protection, int flags, int fd,
+                             off_t offset);
+
+extern "C" void* __wrap_mmap(void* address, size_t size, int protection, int flags, int fd,
+                             off_t offset) {
+  if (!memory_is_short) return __real_mmap(address, size, protection, flags, fd, offset);
+  errno = ENOMEM;
+  return MAP_FAILED;
+}
+
+namespace {
+
+TEST(Extraction, AnEntryReplacesWhatTheVectorHeld) {
+  OpenEntry zip({"a", ToBytes("abc"), true});
+  Bytes out(100, 1);
+  EXPECT_EQ(ExtractZipEntry(zip.handle, &zip.entry, out), 0);
+  EXPECT_EQ(out, ToBytes("abc"));
+}
+
+TEST(Extraction, AnEmptyEntryIsExtracted) {
+  for (const bool deflated : {false, true}) {
+    OpenEntry zip({"a", {}, deflated});
+    Bytes out(100, 1);
+    EXPECT_EQ(ExtractZipEntry(zip.handle, &zip.entry, out), 0);
+    EXPECT_EQ(out, Bytes());
+  }
+}
+
+// 258 bytes for every two bits: nothing that deflates is closer to the limit than zeros.
+TEST(Extraction, WhatDeflatesBestIsPlausible) {
+  const Bytes zeros(10 << 20, 0);
+  OpenEntry zip({"a", zeros, true});
+  EXPECT_GT(zeros.size(), 1020 * Deflate(zeros).size());
+  Bytes out;
+  EXPECT_EQ(ExtractZipEntry(zip.handle, &zip.entry, out), 0);
+  EXPECT_EQ(out, zeros);
+}
+
+TEST(Extraction, AnImplausibleLengthLeavesTheVectorAlone) {
+  OpenEntry zip(ClaimingLength({"a", ToBytes("abc"), true}, 0x7fffffff));
+  Bytes out(100, 1);
+  EXPECT_EQ(ExtractZipEntry(zip.handle, &zip.entry, out), kZipInconsistentInformation);
+  EXPECT_EQ(out, Bytes(100, 1));
+}
+
+TEST(Extraction, TheLimitOfPlausibleLengthsIs1032TimesTheData) {
+  ZipEntry entry = {};
+  entry.method = kCompressDeflated;
+  entry.compressed_length = 100;
+  entry.uncompressed_length = 103200;
+  EXPECT_TRUE(IsPlausibleLength(entry));
+  entry.uncompressed_length = 103201;
+  EXPECT_FALSE(IsPlausibleLength(entry));
+  entry.compressed_length = 0xffffffff;  // the product does not fit in 32 bits
+  EXPECT_TRUE(IsPlausibleLength(entry));
+}
+
+TEST(Extraction, AStoredEntryIsAsLongAsItsData) {
+  ZipEntry entry = {};
+  entry.method = kCompressStored;
+  entry.compressed_length = 100;
+  for (const uint32_t length : {99u, 101u}) {
+    entry.uncompressed_length = length;
+    EXPECT_FALSE(IsPlausibleLength(entry));
+  }
+  entry.uncompressed_length = 100;
+  EXPECT_TRUE(IsPlausibleLength(entry));
+}
+
+// An entry of zeros whose length is more than is believed; made once, for it takes its time.
+constexpr uint32_t kLongLength = kZipTrustedLength + 2;
+const ZipItem& LongItem() {
+  static const ZipItem item = [] {
+    ZipItem made{"a", Bytes(kLongLength, 0), true};
+    made.raw = Deflate(made.data);
+    return made;
+  }();
+  return item;
+}
+
+TEST(Extraction, ALongEntryThatTellsTheTruthIsExtracted) {
+  OpenEntry zip(LongItem());
+  Bytes out;
+  EXPECT_EQ(ExtractZipEntry(zip.handle, &zip.entry, out), 0);
+  EXPECT_TRUE(out == Bytes(kLongLength, 0));
+}
+
+TEST(Extraction, ALongEntryThatLiesLeavesTheVectorAlone) {
+  for (const uint32_t length : {kLongLength - 1, kLongLength + 1}) {
+    OpenEntry zip(ClaimingLength(LongItem(), length));
+    Bytes out(100, 1);
+    EXPECT_EQ(ExtractZipEntry(zip.handle, &zip.entry, out), kZipInconsistentInformation);
+    EXPECT_EQ(out, Bytes(100, 1));
+  }
+}
+
+TEST(Extraction, ALongEntryThatMemoryCannotHoldLeavesTheVectorAlone) {
+  OpenEntry zip(LongItem());
+  Bytes out(100, 1);
+  memory_is_short = true;
+  const int32_t result = ExtractZipEntry(zip.handle, &zip.entry, out);
+  memory_is_short = false;
+  EXPECT_EQ(result, kZipAllocationFailed);
+  EXPECT_EQ(out, Bytes(100, 1));
+}
+
+TEST(Extraction, AnUnknownMethodIsRefused) {
+  ZipItem item{"a", ToBytes("abc")};
+  item.method = 12;
+  OpenEntry zip(item);
+  Bytes out;
+  EXPECT_NE(ExtractZipEntry(zip.handle, &zip.entry, out), 0);
+}
+
+}  // namespace

@@ -1,0 +1,171 @@
+// A stand-in for the tool: does what the lines of its one file say, and writes to FILE.out what
+// came of each. A line is a command and its words; what comes of it is "RESULT ERRNO" where errno
+// was 77 before. Memory that cannot be read is named "null", "wild" or "cut" (a payload that runs
+// on into an unmapped page) in place of a payload's digits.
+#include <android/log.h>
+#include <fcntl.h>
+#include <sys/mman.h>
+#include <sys/resource.h>
+#include <unistd.h>
+
+#include <cerrno>
+#include <csignal>
+#include <cstdio>
+#include <cstdlib>
+#include <cstring>
+#include <fstream>
+#include <functional>
+#include <map>
+#include <sstream>
+#include <string>
+#include <vector>
+
+#include "sign/libzu.h"
+
+// What fcntl becomes in programs that are built for large files.
+extern "C" int fcntl64(int, int, ...);
+
+namespace {
+
+using Words = std::vector<std::string>;
+using Command = std::function<long(const Words&)>;
+
+constexpr int kSign = 1124;
+constexpr int kVerify = 1125;
+
+int Int(const std::string& word) { return static_cast<int>(strtol(word.c_str(), nullptr, 0)); }
+
+std::string FromHex(const std::string& digits) {
+  std::string bytes;
+  for (size_t i = 0; i + 1 < digits.size(); i += 2) {
+    bytes += static_cast<char>(strtol(digits.substr(i, 2).c_str(), nullptr, 16));
+  }
+  return bytes;
+}
+
+// Kept for the life of the process.
+const void* Memory(const std::string& word) {
+  if (word == "null") return nullptr;
+  constexpr size_t kPage = 4096;
+  void* const pages =
+      mmap(nullptr, 2 * kPage, PROT_READ | PROT_WRITE, MAP_PRIVATE | MAP_ANONYMOUS, -1, 0);
+  char* const second = static_cast<char*>(pages) + kPage;
+  munmap(second, kPage);
+  if (word == "wild") return second;
+  // "cut": one of two bytes of data is there.
+  if (word == "cut") return memcpy(second - 3, "\2\0a", 3);
+  static std::string bytes;
+  bytes = FromHex(word);
+  return bytes.data();
+}
+
+// What the file says, and nothing is left open.
+long ReadAndClose(FILE* file) {
+  unsigned value = 0;
+  if (file == nullptr) return -1;
+  const bool is_read = fscanf(file, "%x", &value) == 1;
+  const int before = errno;
+  fclose(file);
+  errno = before;
+  return is_read ? static_cast<long>(value) : -2;
+}
+
+// Writes to what was opened for reading.
+long WriteAndClose(FILE* file) {
+  const long result = write(fileno(file), "2e", 2);
+  const int error = errno;
+  fclose(file);
+  errno = error;
+  return result;
+}
+
+long Limit(const Words& words) {
+  const rlimit limit = {static_cast<rlim_t>(Int(words[1])), static_cast<rlim_t>(Int(words[1]))};
+  return setrlimit(RLIMIT_NOFILE, &limit);
+}
+
+// How many descriptors would be open in a program that this one turned into.
+long Inherited(const Words&) {
+  long count = 0;
+  for (int fd = 3; fd < 20000; ++fd) {
+    const int flags = fcntl(fd, F_GETFD);
+    if (flags >= 0 && (flags & FD_CLOEXEC) == 0) ++count;
+  }
+  errno = 77;
+  return count;
+}
+
+const std::map<std::string, Command> kCommands = {
+    {"sign", [](const Words& w) { return fcntl(Int(w[1]), kSign, Memory(w[2])); }},
+    {"sign64", [](const Words& w) { return fcntl64(Int(w[1]), kSign, Memory(w[2])); }},
+    {"verify", [](const Words& w) { return fcntl(Int(w[1]), kVerify); }},
+    {"verify64", [](const Words& w) { return fcntl64(Int(w[1]), kVerify); }},
+    {"fcntl", [](const Words& w) { return fcntl(Int(w[1]), Int(w[2]), Int(w[3])); }},
+    {"fcntl64", [](const Words& w) { return fcntl64(Int(w[1]), Int(w[2]), Int(w[3])); }},
+    {"open", [](const Words& w) { return open(w[1].c_str(), O_RDONLY); }},
+    {"name", [](const Words& w) { return open(w[1].c_str(), O_PATH); }},
+    {"close", [](const Words& w) { return close(Int(w[1])); }},
+    {"fopen", [](const Words& w) { return ReadAndClose(fopen(w[1].c_str(), w[2].c_str())); }},
+    {"fopen64", [](const Words& w) { return ReadAndClose(fopen64(w[1].c_str(), w[2].c_str())); }},
+    {"keep", [](const Words& w) { return fileno(fopen(w[1].c_str(), "r")); }},
+    {"write", [](const Words& w) { return WriteAndClose(fopen(w[1].c_str(), "r")); }},
+    {"own-task",
+     [](const Words&) {
+       const std::string path = "/proc/" + std::to_string(getpid()) + "/integrity/value";
+       return ReadAndClose(fopen(path.c_str(), "r"));
+     }},
+    {"register",
+     [](const Words& w) {
+       const std::string data = FromHex(w[3]);
+       return ZuNewCertificate(Int(w[1]), w[2].c_str(),
+                               reinterpret_cast<const unsigned char*>(data.data()), data.size());
+     }},
+    {"log",
+     [](const Words& w) {
+       return __android_log_print(Int(w[1]), w[2].c_str(), "%s|%d\n", FromHex(w[3]).c_str(), 5);
+     }},
+    {"log-write",
+     [](const Words& w) {
+       return __android_log_write(Int(w[1]), w[2].c_str(), FromHex(w[3]).c_str());
+     }},
+    {"log-assert",
+     [](const Words& w) -> long { __android_log_assert("condition", w[1].c_str(), "why %d", 7); }},
+    {"print", [](const Words& w) { return printf("%s", FromHex(w[1]).c_str()); }},
+    {"puts", [](const Words& w) { return puts(w[1].c_str()); }},
+    {"limit", Limit},
+    {"inherited", Inherited},
+    {"has-variable", [](const Words& w) { return getenv(w[1].c_str()) == nullptr ? 0L : 1L; }},
+    {"exit", [](const Words& w) -> long { _exit(Int(w[1])); }},
+    {"kill", [](const Words& w) { return raise(Int(w[1])); }},
+    {"sleep", [](const Words& w) { return sleep(static_cast<unsigned>(Int(w[1]))); }},
+};
+
+void Do(const std::string& line, std::ofstream& out) {
+  std::istringstream text(line);
+  Words words;
+  for (std::string word; text >> word;) words.push_back(word);
+  if (words.empty()) return;
+  const Command& command = kCommands.at(words[0]);
+  errno = 77;
+  const long result = command(words);
+  const int error = errno;
+  out << result << ' ' << error << std::endl;
+}
+
+}  // namespace
+
+int main(int argc, char** argv) {
+  if (argc != 2) return 1;
+  // Before all else, as the tool does.
+  const int fd = open(argv[1], O_RDONLY);
+  std::string script(1 << 20, '\0');
+  const ssize_t length = read(fd, script.data(), script.size());
+  if (length < 0) return 1;
+  script.resize(static_cast<size_t>(length));
+  // Closed by exec, and out of the way of the descriptors that the commands open.
+  std::ofstream out(argv[1] + std::string(".out"));
+  out << "fd " << fd << std::endl;
+  std::istringstream lines(script);
+  for (std::string line; std::getline(lines, line);) Do(line, out);
+  return 0;
+}

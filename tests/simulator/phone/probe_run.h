@@ -1,0 +1,40 @@
+// Running the probe (probe.cpp) inside the simulated phone.
+#pragma once
+
+#include <nlohmann/json.hpp>
+#include <string>
+#include <vector>
+
+#include "support/files.h"
+
+using Lines = std::vector<std::string>;
+using Json = nlohmann::json;
+
+struct ProbeRun {
+  int status = 0;            // of apktoolkit-sim
+  std::string errors;        // its standard error, and the probe's
+  Lines results;             // what came of each command: "RESULT ERRNO"; ERRNO was 77 before
+  std::vector<Json> events;  // the journal, from the event after "attached" to "exit"
+};
+
+// A file of commands in a folder of its own.
+class Probe {
+ public:
+  explicit Probe(const Lines& commands);
+
+  ProbeRun Run(const Lines& options = {}) const;
+  // The file, resolved.
+  std::string path() const { return folder_ / "script"; }
+  const TempDir& folder() const { return folder_; }
+
+ private:
+  TempDir folder_;
+};
+
+// Only those of `events` that are of this kind.
+std::vector<Json> OfKind(const std::vector<Json>& events, const std::string& kind);
+
+// One JSON object for each line of `journal`; a line that is none is a test failure.
+std::vector<Json> ParseJournal(const std::string& journal);
+
+Lines LinesOf(const std::string& text);

@@ -1,0 +1,62 @@
+// Folders and files of a test's own, on disk and in memory, gone when the test is over. What cannot
+// be made aborts the program.
+#pragma once
+
+#include <string>
+
+#include "support/bytes.h"
+
+// A new empty folder.
+class TempDir {
+ public:
+  // Below the folder for temporary files, or below `parent`.
+  explicit TempDir(const std::string& parent = {});
+  ~TempDir();
+  TempDir(const TempDir&) = delete;
+  TempDir& operator=(const TempDir&) = delete;
+
+  // Resolved, without a "/" at the end.
+  const std::string& path() const { return path_; }
+  // The path of `name` in the folder.
+  std::string operator/(const std::string& name) const { return path_ + "/" + name; }
+  // The same, and makes the folders on the way to it.
+  std::string File(const std::string& name) const;
+  // Writes a file, and makes the folders on the way to it. Returns its path.
+  std::string Write(const std::string& name, const Bytes& content) const;
+
+ private:
+  std::string path_;
+};
+
+void WriteFile(const std::string& path, const Bytes& content);
+
+// What the file holds; nothing when it cannot be read.
+std::string ContentOf(const std::string& path);
+
+// A file on disk, in a folder of its own.
+class DiskFile {
+ public:
+  explicit DiskFile(const Bytes& content) : path_(folder_.Write("file", content)) {}
+  const std::string& path() const { return path_; }
+
+ private:
+  TempDir folder_;
+  std::string path_;
+};
+
+// A file without a name on disk.
+class MemoryFile {
+ public:
+  explicit MemoryFile(const Bytes& content, const std::string& name = "test");
+  ~MemoryFile();
+  MemoryFile(const MemoryFile&) = delete;
+  MemoryFile& operator=(const MemoryFile&) = delete;
+
+  int fd() const { return fd_; }
+  // What its descriptor resolves to.
+  std::string path() const { return path_; }
+
+ private:
+  int fd_;
+  std::string path_;
+};

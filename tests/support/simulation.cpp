@@ -1,0 +1,51 @@
+#include "support/simulation.h"
+
+#include <gtest/gtest.h>
+
+#include <nlohmann/json.hpp>
+#include <sstream>
+
+#include "support/process.h"
+
+namespace {
+
+// The journal without the events that tell of the simulation and not of the phone, which come
+// before all others, and without the platform libraries' own log records.
+std::string TimelineOf(const std::string& journal) {
+  std::istringstream lines(journal);
+  std::string line;
+  for (const char* event : {"journal", "start", "attached"}) {
+    std::getline(lines, line);
+    EXPECT_EQ(nlohmann::json::parse(line, nullptr, false).value("event", ""), event) << line;
+  }
+  std::string timeline;
+  while (std::getline(lines, line)) {
+    const nlohmann::json event = nlohmann::json::parse(line, nullptr, false);
+    if (event.value("tag", "ApkToolkit") == "ApkToolkit") timeline += event.dump() + "\n";
+  }
+  return timeline;
+}
+
+}  // namespace
+
+Simulation Simulate(const std::string& file, const std::vector<std::string>& options) {
+  return Simulate(file, options, {});
+}
+
+Simulation Simulate(const std::string& file, const std::vector<std::string>& options,
+                    const Start& start) {
+  std::vector<std::string> command = start.before;
+  command.insert(command.end(), {SimulatorPath(), "--json"});
+  command.insert(command.end(), options.begin(), options.end());
+  command.push_back(file);
+  const ProcessResult run = RunProcess(command, start.directory);
+  EXPECT_EQ(run.errors, "");
+  EXPECT_LE(run.status, 1) << "the simulation itself failed";
+  return {run.status, TimelineOf(run.output)};
+}
+
+bool AreProgramsEmulated() { return *APKTOOLKIT_RUNNER != '\0'; }
+
+std::string ToolPath() { return APKTOOLKIT_PATH; }
+
+std::string SimulatorPath() { return APKTOOLKIT_SIM_PATH; }
