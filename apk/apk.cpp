@@ -44,9 +44,7 @@ bool Apk::VerifyPackage(const std::vector<uint8_t>& android_manifest) {
     return false;
   }
   const size_t size = manifest.size();
-  ManifestMf manifest_mf;
-  EntryDigests entry_digests;
-  if (!entry_digests.Load(std::move(manifest), manifest_mf)) {
+  if (!entry_digests_.Load(std::move(manifest))) {
     LogError("Can't load manifest: size=%zu\n", size);
     return false;
   }
@@ -54,9 +52,7 @@ bool Apk::VerifyPackage(const std::vector<uint8_t>& android_manifest) {
     LogError("Can't process Android Manifest.\n");
     return false;
   }
-  // The one points into the other: they change together or not at all.
-  manifest_mf_ = std::move(manifest_mf);
-  entry_digests_ = std::move(entry_digests);
+  entry_digests_.List();
   return true;
 }
 

@@ -116,13 +116,11 @@ class Apk {
   bool is_good_apk_ = false;
   bool dex_checked_ = false;
   bool is_good_zip_ = false;
-  EntryDigests entry_digests_;  // of manifest_mf_
-  ManifestMf manifest_mf_;
+  EntryDigests entry_digests_;  // and the manifest that they are from
   ManifestMf cert_sf_;
   std::vector<uint8_t> manufacturer_key_;
   bool ss_permission_required_ = false;
   std::string package_name_;
-  std::vector<uint8_t> file_content_;  // of VerifyFileHash; kept from one file to the next
 };
 
 }  // namespace ApkTools

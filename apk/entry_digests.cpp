@@ -3,65 +3,61 @@
 #include <algorithm>
 #include <utility>
 
-#include "util/text.h"
-
 namespace ApkTools {
 
 namespace {
 
-// What a section records of its entry. Each may be empty, for lack of the attribute.
-struct Record {
-  std::string_view name, digest_name, digest;
-};
-
-Record ReadRecord(const ManifestMf::Section& section);
+// Name and value of the digest attribute that counts.
+ManifestMf::Section::value_type DigestOf(const ManifestMf::Section& section) {
+  return section.findLastEndingIn("-Digest");
+}
 
 }  // namespace
 
-bool EntryDigests::Load(std::vector<uint8_t> text, ManifestMf& manifest) {
-  const auto collect = [&](const ManifestMf::Section& section, size_t position) {
-    Record record = ReadRecord(section);
-    // The main section, which names no entry, is left out here as well.
-    if (record.name.empty() || record.digest_name.empty() || record.digest.empty()) return;
-    if (!manifest.holds(record.name)) record.name = joined_names_.emplace_front(record.name);
-    entries_.push_back({record.name, position});
-  };
-  if (!manifest.load(std::move(text), collect)) return false;
-  // Most manifests list the entries in the order of their names.
-  if (!std::is_sorted(entries_.begin(), entries_.end())) {
-    std::stable_sort(entries_.begin(), entries_.end());
-  }
-  return true;
+bool EntryDigests::Load(std::vector<uint8_t> text) {
+  sections_.clear();
+  return manifest_mf_.load(std::move(text));
 }
 
-bool EntryDigests::Find(const ManifestMf& manifest, std::string_view name, std::string& digest_name,
+void EntryDigests::List() {
+  const ManifestMf::Sections& sections = manifest_mf_.getSections();
+  sections_.reserve(sections.size());
+  std::string_view last;
+  bool in_order = true;
+  for (uint32_t i = 0; i < sections.size(); ++i) {
+    const std::string_view name = NameOf(i);
+    // The main section, which names no entry, is left out here as well.
+    if (name.empty() || DigestOf(sections[i]).first.empty()) continue;
+    in_order = in_order && last <= name;
+    last = name;
+    sections_.push_back(i);
+  }
+  // As most manifests have them.
+  if (!in_order) Sort();
+}
+
+bool EntryDigests::Find(std::string_view name, std::string& digest_name,
                         std::string& digest) const {
   // The last of equal names: a later section replaces an earlier one.
-  const auto behind = std::upper_bound(entries_.begin(), entries_.end(), Entry{name, 0});
-  if (behind == entries_.begin() || behind[-1].name != name) return false;
-  const ManifestMf::Section section = manifest.readSection(behind[-1].section);
-  const Record record = ReadRecord(section);
-  digest_name = record.digest_name;
-  digest = record.digest;
+  const auto next = std::upper_bound(
+      sections_.begin(), sections_.end(), name,
+      [this](std::string_view wanted, uint32_t section) { return wanted < NameOf(section); });
+  if (next == sections_.begin() || NameOf(next[-1]) != name) return false;
+  const auto [attribute, value] = DigestOf(manifest_mf_.getSections()[next[-1]]);
+  digest_name = attribute;
+  digest = value;
   return true;
 }
 
-namespace {
-
-Record ReadRecord(const ManifestMf::Section& section) {
-  Record record;
-  for (const auto& [name, value] : section) {
-    if (name == "Name") record.name = value;
-    // Deliberate: of several digests the last in the order of names counts, so that "SHA1-Digest"
-    // goes before "SHA-256-Digest". The signature file's are chosen in the same way.
-    if (EndsWith(name, "-Digest")) {
-      record.digest_name = name;
-      record.digest = value;
-    }
-  }
-  return record;
+void EntryDigests::Sort() {
+  std::vector<std::pair<std::string_view, uint32_t>> named;
+  for (const uint32_t section : sections_) named.emplace_back(NameOf(section), section);
+  std::sort(named.begin(), named.end());
+  for (size_t i = 0; i < named.size(); ++i) sections_[i] = named[i].second;
 }
 
-}  // namespace
+std::string_view EntryDigests::NameOf(uint32_t section) const {
+  return manifest_mf_.getSections()[section].find("Name");
+}
 
 }  // namespace ApkTools

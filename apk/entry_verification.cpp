@@ -1,5 +1,4 @@
 // Single entries and files against the digests that the manifest records for them.
-#include <algorithm>
 #include <set>
 
 #include "apk/apk.h"
@@ -38,13 +37,8 @@ bool Apk::VerifyEntryHash(const std::string& name, ZipEntry& entry) {
 }
 
 bool Apk::VerifyFileHash(const std::string& name, const std::string& path) {
-  return VerifyContent(name, file_content_, [&] {
-    size_t length;
-    if (!ReadFile(path, file_content_, length)) return false;
-    // A file that shrinks meanwhile must not end in what the file before it held.
-    std::fill(file_content_.begin() + static_cast<ptrdiff_t>(length), file_content_.end(), 0);
-    return true;
-  });
+  std::vector<uint8_t> content;
+  return VerifyContent(name, content, [&] { return ReadFile(path, content); });
 }
 
 // `read_content` fills `content`, and answers whether it could; it is not called for a name that
@@ -53,7 +47,7 @@ template <typename ReadContent>
 bool Apk::VerifyContent(const std::string& name, const std::vector<uint8_t>& content,
                         ReadContent read_content) {
   std::string digest_name, digest;
-  if (!entry_digests_.Find(manifest_mf_, name, digest_name, digest)) {
+  if (!entry_digests_.Find(name, digest_name, digest)) {
     if (CanSkipValidation(name)) return true;
     LogError("Can't find file in %s: %s\n", kMANIFEST_MF, name.c_str());
     return false;

@@ -13,7 +13,6 @@
 #include "crypto/rsa.h"
 #include "util/digest.h"
 #include "util/log.h"
-#include "util/text.h"
 
 namespace ApkTools {
 
@@ -23,8 +22,6 @@ std::string SignatureBlockName(const std::string& signature_file_name);
 bool FitsInBlock(const std::vector<uint8_t>& block, const uint8_t* start, size_t length);
 int VerifySignature(rsa_context& key, const std::vector<uint8_t>& block, const uint8_t* sha1,
                     const uint8_t* sha256, const uint8_t* md5, const uint8_t* signature);
-bool FindManifestDigest(const ManifestMf::Section& section, std::string& digest_name,
-                        std::vector<uint8_t>& expected);
 
 // A key that is wiped and released with its owner.
 struct ScopedRsaKey {
@@ -122,10 +119,12 @@ bool Apk::ValidateManifest(const std::vector<uint8_t>& manifest) {
     LogError("Can't validate manifest. Bad SF file.\n");
     return false;
   }
+  constexpr std::string_view kManifest = "-Manifest";
   for (const ManifestMf::Section& section : cert_sf_.getSections()) {
-    std::string digest_name;
-    std::vector<uint8_t> expected;
-    if (!FindManifestDigest(section, digest_name, expected)) continue;
+    const auto [name, value] = section.findLastEndingIn("-Digest-Manifest");
+    if (name.empty()) continue;
+    const std::string digest_name(name.substr(0, name.size() - kManifest.size()));
+    const std::vector<uint8_t> expected = Base64Decode(std::string(value));
     if (!expected.empty() && VerifyData(digest_name, expected, manifest)) return true;
     // Deliberate: the first section with a digest decides; a later one cannot repair it.
     break;
@@ -176,22 +175,6 @@ int VerifySignature(rsa_context& key, const std::vector<uint8_t>& block, const u
                     const uint8_t* sha256, const uint8_t* md5, const uint8_t* signature) {
   if (!FitsInBlock(block, signature, static_cast<size_t>(key.len))) return kRsaBadInput;
   return rsa_pkcs1_verify(&key, sha1, sha256, md5, signature);
-}
-
-// The manifest's digest in a section of the signature file, and the name of its attribute without
-// "-Manifest". False when there is none. Of several, the last in the order of names is taken.
-bool FindManifestDigest(const ManifestMf::Section& section, std::string& digest_name,
-                        std::vector<uint8_t>& expected) {
-  constexpr std::string_view kManifest = "-Manifest";
-  constexpr std::string_view kDigestManifest = "-Digest-Manifest";
-  bool found = false;
-  for (const auto& [name, value] : section) {
-    if (!EndsWith(name, kDigestManifest)) continue;
-    digest_name = name.substr(0, name.size() - kManifest.size());
-    expected = Base64Decode(std::string(value));
-    found = true;
-  }
-  return found;
 }
 
 }  // namespace

@@ -28,16 +28,11 @@ class ScopedFd {
 };
 
 ssize_t FindSize(int fd);
-size_t ReadBytes(int fd, std::vector<uint8_t>& out);
+void ReadBytes(int fd, std::vector<uint8_t>& out);
 
 }  // namespace
 
 bool ReadFile(const std::string& path, std::vector<uint8_t>& out) {
-  size_t length;
-  return ReadFile(path, out, length);
-}
-
-bool ReadFile(const std::string& path, std::vector<uint8_t>& out, size_t& length) {
   // O_NONBLOCK: the open of a FIFO would wait for a writer; a regular file does not know the flag.
   const ScopedFd fd(open(path.c_str(), O_RDONLY | O_NONBLOCK | O_CLOEXEC));
   if (fd.get() == -1) {
@@ -53,7 +48,7 @@ bool ReadFile(const std::string& path, std::vector<uint8_t>& out, size_t& length
   out.resize(static_cast<size_t>(size));
   // Deliberate: how much could be read is not asked. A file that shrinks meanwhile leaves the end
   // of `out` as it is; its digest, which every caller takes, then is not the expected one.
-  length = ReadBytes(fd.get(), out);
+  ReadBytes(fd.get(), out);
   return true;
 }
 
@@ -77,8 +72,8 @@ ssize_t FindSize(int fd) {
   return lseek(fd, 0, SEEK_SET) == 0 ? size : kUnknownSize;
 }
 
-// Fills `out` from `fd`, as far as there is something to read; returns how many bytes there were.
-size_t ReadBytes(int fd, std::vector<uint8_t>& out) {
+// Fills `out` from `fd`, as far as there is something to read.
+void ReadBytes(int fd, std::vector<uint8_t>& out) {
   size_t done = 0;
   while (done < out.size()) {
     const ssize_t count = read(fd, out.data() + done, out.size() - done);
@@ -86,7 +81,6 @@ size_t ReadBytes(int fd, std::vector<uint8_t>& out) {
     if (count <= 0) break;
     done += static_cast<size_t>(count);
   }
-  return done;
 }
 
 }  // namespace

@@ -15,8 +15,6 @@
 // A file that gives fewer bytes than its size is still true; the rest of `out` is what growing it
 // made it: zeros where it was shorter before, what it held where it was not.
 bool ReadFile(const std::string& path, std::vector<uint8_t>& out);
-// The same, and tells in `length` how many bytes the file gave.
-bool ReadFile(const std::string& path, std::vector<uint8_t>& out, size_t& length);
 
 // The path of the file that `fd` is open on, as the kernel tells it, cut to its first 4095 bytes;
 // empty when `fd` is not open or the kernel has no path to tell.

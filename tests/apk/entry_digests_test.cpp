@@ -3,7 +3,6 @@
 #include <gtest/gtest.h>
 
 #include <string>
-#include <utility>
 
 #include "support/log_capture.h"
 
@@ -11,30 +10,25 @@ using ApkTools::EntryDigests;
 
 namespace {
 
-// A manifest, and what it records.
+// What a manifest of these sections records.
 class Recorded {
  public:
   explicit Recorded(const std::string& sections) {
     const std::string text = "Manifest-Version: 1.0\r\n\r\n" + sections;
-    loaded_ = digests_.Load({text.begin(), text.end()}, manifest_);
+    EXPECT_TRUE(digests_.Load({text.begin(), text.end()}));
+    digests_.List();
   }
-
-  bool loaded() const { return loaded_; }
 
   // "ATTRIBUTE VALUE", or "none".
   std::string Of(const std::string& name) const {
     std::string digest_name, digest;
-    if (digests_.Find(manifest_, name, digest_name, digest)) return digest_name + " " + digest;
+    if (digests_.Find(name, digest_name, digest)) return digest_name + " " + digest;
     EXPECT_EQ("", digest_name + digest);
     return "none";
   }
 
-  Recorded Moved() { return std::move(*this); }
-
  private:
-  ManifestMf manifest_;
   EntryDigests digests_;
-  bool loaded_;
 };
 
 std::string Section(const std::string& name, const std::string& digest) {
@@ -43,12 +37,11 @@ std::string Section(const std::string& name, const std::string& digest) {
 
 TEST(EntryDigests, FreshObjectHasNone) {
   std::string digest_name, digest;
-  EXPECT_FALSE(EntryDigests().Find(ManifestMf(), "a", digest_name, digest));
+  EXPECT_FALSE(EntryDigests().Find("a", digest_name, digest));
 }
 
 TEST(EntryDigests, EntriesInTheOrderOfTheirNamesAreFound) {
   const Recorded recorded(Section("a", "1") + Section("b", "2") + Section("c", "3"));
-  EXPECT_TRUE(recorded.loaded());
   EXPECT_EQ("SHA-256-Digest 1", recorded.Of("a"));
   EXPECT_EQ("SHA-256-Digest 2", recorded.Of("b"));
   EXPECT_EQ("SHA-256-Digest 3", recorded.Of("c"));
@@ -97,16 +90,53 @@ TEST(EntryDigests, NamesAndDigestsOnSeveralLinesAreJoined) {
   EXPECT_EQ("SHA-256-Digest 456", recorded.Of("res/drawable/b"));
 }
 
-TEST(EntryDigests, AManifestAndItsDigestsMayBothBeMoved) {
-  Recorded recorded("Name: b\r\n c\r\nSHA-256-Digest: 1\r\n 2\r\n\r\n" + Section("a", "3"));
-  const Recorded moved = recorded.Moved();
-  EXPECT_EQ("SHA-256-Digest 12", moved.Of("bc"));
-  EXPECT_EQ("SHA-256-Digest 3", moved.Of("a"));
+TEST(EntryDigests, ASectionThatLacksOneOfTheThreeIsNotListed) {
+  const Recorded recorded(
+      "Name: a\r\n\r\nName: b\r\nSHA1-Digest: \r\n\r\nName: \r\nSHA1-Digest: 1\r\n\r\n");
+  for (const char* name : {"a", "b", ""}) EXPECT_EQ("none", recorded.Of(name)) << name;
+}
+
+TEST(EntryDigests, NamesOfAttributesAreCaseSensitive) {
+  const Recorded recorded(
+      "NAME: a\r\nSHA1-Digest: 1\r\n\r\nName: b\r\nSHA1-DIGEST: 1\r\n\r\n"
+      "Name: c\r\n-Digest: 1\r\n\r\nName: d\r\nDigest: 1\r\n\r\n");
+  EXPECT_EQ("none", recorded.Of("a"));
+  EXPECT_EQ("none", recorded.Of("b"));
+  EXPECT_EQ("-Digest 1", recorded.Of("c"));
+  EXPECT_EQ("none", recorded.Of("d"));
+}
+
+TEST(EntryDigests, NothingIsListedBeforeItIsAskedFor) {
+  const std::string text = Section("a", "1");
+  EntryDigests digests;
+  EXPECT_TRUE(digests.Load({text.begin(), text.end()}));
+  std::string digest_name, digest;
+  EXPECT_FALSE(digests.Find("a", digest_name, digest));
+  digests.List();
+  EXPECT_TRUE(digests.Find("a", digest_name, digest));
+}
+
+// Whether it parses or not: nothing is left of the one before.
+TEST(EntryDigests, LoadingAnotherManifestForgetsTheFirstOnes) {
+  LogCapture log;
+  for (const std::string& other : {Section("b", "2"), std::string("Key:x")}) {
+    const std::string text = Section("a", "1");
+    EntryDigests digests;
+    EXPECT_TRUE(digests.Load({text.begin(), text.end()}));
+    digests.List();
+    EXPECT_EQ(other != "Key:x", digests.Load({other.begin(), other.end()}));
+    std::string digest_name, digest;
+    EXPECT_FALSE(digests.Find("a", digest_name, digest));
+    digests.List();
+    EXPECT_FALSE(digests.Find("a", digest_name, digest));
+    EXPECT_EQ(other != "Key:x", digests.Find("b", digest_name, digest));
+  }
 }
 
 TEST(EntryDigests, AManifestThatDoesNotParseIsNotLoaded) {
   LogCapture log;
-  EXPECT_FALSE(Recorded(Section("a", "1") + "Key:x").loaded());
+  const std::string text = Section("a", "1") + "Key:x";
+  EXPECT_FALSE(EntryDigests().Load({text.begin(), text.end()}));
 }
 
 }  // namespace

@@ -55,6 +55,12 @@ PackageOptions WithLibraries(const std::vector<ZipItem>& libraries) {
   return options;
 }
 
+PackageOptions WithoutDex() {
+  PackageOptions options;
+  options.entries = {{"lib/arm64-v8a/libfoo.so", ToBytes("foo")}};
+  return options;
+}
+
 PackageOptions WithManifest(const std::string& text) {
   PackageOptions options;
   options.edit_manifest = [=](const std::string&) { return text; };

@@ -62,6 +62,8 @@ Package MakePackage(const PackageOptions& options = {});
 PackageOptions PlainJar();
 // What makes a package with these entries beside the Android manifest and a dex file.
 PackageOptions WithLibraries(const std::vector<ZipItem>& libraries);
+// What makes a good package with a native library and no dex file.
+PackageOptions WithoutDex();
 // What makes a good package with this text for its manifest.
 PackageOptions WithManifest(const std::string& text);
 

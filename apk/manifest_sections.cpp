@@ -1,0 +1,90 @@
+#include "apk/manifest_sections.h"
+
+#include <algorithm>
+
+#include "util/text.h"
+
+namespace {
+
+std::string_view View(const char* text, const ManifestPiece& piece) {
+  return {text + piece.start, piece.length};
+}
+
+}  // namespace
+
+ManifestSection::value_type ManifestSection::operator[](size_t index) const {
+  return {View(text_, attributes_[index].name), View(text_, attributes_[index].value)};
+}
+
+std::string_view ManifestSection::find(std::string_view name) const {
+  const ManifestAttribute* const end = attributes_ + size_;
+  const ManifestAttribute* const found = std::lower_bound(
+      attributes_, end, name, [this](const ManifestAttribute& attribute, std::string_view wanted) {
+        return View(text_, attribute.name) < wanted;
+      });
+  if (found == end || View(text_, found->name) != name) return {};
+  return View(text_, found->value);
+}
+
+// Deliberate: of several digests the last in the order of names counts, so that "SHA1-Digest" goes
+// before "SHA-256-Digest", for an entry as for the whole manifest. It is the order in which packages
+// that carry both have always been judged.
+ManifestSection::value_type ManifestSection::findLastEndingIn(std::string_view suffix) const {
+  for (size_t i = size_; i > 0; --i) {
+    if (EndsWith(View(text_, attributes_[i - 1].name), suffix)) return (*this)[i - 1];
+  }
+  return {};
+}
+
+ManifestSection ManifestSections::operator[](size_t index) const {
+  const size_t start = index == 0 ? 0 : ends_[index - 1];
+  return {text_, attributes_.data() + start, ends_[index] - start};
+}
+
+void ManifestSections::reset(const uint8_t* text, size_t size) {
+  // Few attributes are shorter, and no archive has more entries than need so many. A table that
+  // grows in steps would leave its former memory behind; this one takes none before it is filled.
+  constexpr size_t kShortAttribute = 32;
+  constexpr size_t kManyAttributes = 1 << 17;
+  text_ = reinterpret_cast<const char*>(text);
+  attributes_.clear();
+  attributes_.reserve(std::min(size / kShortAttribute, kManyAttributes));
+  ends_.clear();
+  patience_ = kFewAttributes;
+}
+
+// A section that has doubled is put in order, which drops what repeats: so it takes memory for twice
+// its names at the most, and the time for it stays that of putting each name in order a few times.
+void ManifestSections::add(const ManifestAttribute& attribute) {
+  attributes_.push_back(attribute);
+  if (attributes_.size() - openStart() < patience_) return;
+  order();
+  patience_ = kFewAttributes + 2 * (attributes_.size() - openStart());
+}
+
+void ManifestSections::endSection() {
+  order();
+  ends_.push_back(static_cast<uint32_t>(attributes_.size()));
+  patience_ = kFewAttributes;
+}
+
+// Puts the section at hand in the order of its names. Of equal names the one that is last in the
+// text stays.
+void ManifestSections::order() {
+  const auto name = [this](const ManifestAttribute& a) { return View(text_, a.name); };
+  const auto is_out_of_order = [&](const ManifestAttribute& a, const ManifestAttribute& b) {
+    return name(a) >= name(b);
+  };
+  const auto first = attributes_.begin() + static_cast<ptrdiff_t>(openStart());
+  const auto last = attributes_.end();
+  if (std::adjacent_find(first, last, is_out_of_order) == last) return;
+
+  std::sort(first, last, [&](const ManifestAttribute& a, const ManifestAttribute& b) {
+    const int order = name(a).compare(name(b));
+    return order != 0 ? order < 0 : a.name.start < b.name.start;
+  });
+  const auto kept = std::unique(
+      std::make_reverse_iterator(last), std::make_reverse_iterator(first),
+      [&](const ManifestAttribute& a, const ManifestAttribute& b) { return name(a) == name(b); });
+  attributes_.erase(first, kept.base());
+}

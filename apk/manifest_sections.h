@@ -1,0 +1,103 @@
+// The sections of a manifest, as one flat table: an attribute is two pieces of a text that somebody
+// else owns, a section is a run of attributes. No string is copied, and nothing is logged.
+#pragma once
+
+#include <cstddef>
+#include <cstdint>
+#include <iterator>
+#include <string_view>
+#include <utility>
+#include <vector>
+
+// A piece of the text, in bytes from its start. No entry of an archive is longer than 2^32 - 1
+// bytes, and a large manifest has some hundred thousand pieces.
+struct ManifestPiece {
+  uint32_t start = 0;
+  uint32_t length = 0;
+};
+
+struct ManifestAttribute {
+  ManifestPiece name;
+  ManifestPiece value;
+};
+
+// Walks what can be asked for its elements by number, and makes each as it is asked for.
+template <typename Range>
+class ElementIterator {
+ public:
+  using iterator_category = std::forward_iterator_tag;
+  using value_type = typename Range::value_type;
+  using difference_type = ptrdiff_t;
+  using pointer = const value_type*;
+  using reference = value_type;
+
+  ElementIterator(const Range* range, size_t index) : range_(range), index_(index) {}
+  value_type operator*() const { return (*range_)[index_]; }
+  ElementIterator& operator++() {
+    ++index_;
+    return *this;
+  }
+  bool operator==(const ElementIterator& other) const { return index_ == other.index_; }
+  bool operator!=(const ElementIterator& other) const { return index_ != other.index_; }
+
+ private:
+  const Range* range_;
+  size_t index_;
+};
+
+// Attribute values by name, in byte order of the names: an ordered map. Of equal names in the text
+// the last one counts. Neither a name nor a value is ever empty.
+class ManifestSection {
+ public:
+  // Name and value.
+  using value_type = std::pair<std::string_view, std::string_view>;
+
+  ManifestSection(const char* text, const ManifestAttribute* attributes, size_t size)
+      : text_(text), attributes_(attributes), size_(size) {}
+
+  size_t size() const { return size_; }
+  value_type operator[](size_t index) const;
+  ElementIterator<ManifestSection> begin() const { return {this, 0}; }
+  ElementIterator<ManifestSection> end() const { return {this, size_}; }
+
+  // The value of the attribute of this name; empty when there is none.
+  std::string_view find(std::string_view name) const;
+  // The last of the attributes whose names end so; two empty texts when there is none.
+  value_type findLastEndingIn(std::string_view suffix) const;
+
+ private:
+  const char* text_;
+  const ManifestAttribute* attributes_;
+  size_t size_;
+};
+
+// All sections in the order of the text.
+class ManifestSections {
+ public:
+  using value_type = ManifestSection;
+
+  size_t size() const { return ends_.size(); }
+  ManifestSection operator[](size_t index) const;
+  ElementIterator<ManifestSections> begin() const { return {this, 0}; }
+  ElementIterator<ManifestSections> end() const { return {this, size()}; }
+
+  // How they come to be. Forgets all; what is added from now on are pieces of the `size` bytes at
+  // `text`.
+  void reset(const uint8_t* text, size_t size);
+  // Adds an attribute to the section at hand, none of whose pieces is empty. Names that repeat take
+  // no memory.
+  void add(const ManifestAttribute& attribute);
+  // Ends the section at hand, which may be empty. Until it has ended it is not there.
+  void endSection();
+
+ private:
+  static constexpr size_t kFewAttributes = 64;
+
+  size_t openStart() const { return ends_.empty() ? 0 : ends_.back(); }
+  void order();
+
+  const char* text_ = nullptr;
+  std::vector<ManifestAttribute> attributes_;
+  std::vector<uint32_t> ends_;          // of each section in attributes_
+  size_t patience_ = kFewAttributes;    // so many attributes in the section at hand are too many
+};

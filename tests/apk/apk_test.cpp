@@ -1,0 +1,315 @@
+// Init: the flags that say how far it got, and the road of a package step by step.
+#include "apk/apk.h"
+
+#include <fcntl.h>
+#include <gtest/gtest.h>
+#include <unistd.h>
+
+#include <cstdio>
+
+#include "support/compiled_manifest.h"
+#include "support/jar.h"
+#include "support/log_capture.h"
+#include "support/open_package.h"
+
+using ApkTools::Apk;
+
+namespace {
+
+constexpr int32_t kInvalidHandle = -4;
+
+// The flags, and whether there is an open archive, in one comparable value.
+struct State {
+  bool good_zip, apk, good_apk, open;
+};
+bool operator==(const State& a, const State& b) {
+  return a.good_zip == b.good_zip && a.apk == b.apk && a.good_apk == b.good_apk && a.open == b.open;
+}
+std::ostream& operator<<(std::ostream& out, const State& state) {
+  return out << state.good_zip << state.apk << state.good_apk << state.open;
+}
+
+// The package must hold no "classes.dex" for IsGoodApk to be the verdict of Init alone.
+State StateOf(Apk& apk) {
+  void* cookie = nullptr;
+  const int32_t result = apk.StartIteration(&cookie, "", "");
+  if (result == 0) apk.EndIteration(cookie);
+  EXPECT_TRUE(result == 0 || result == kInvalidHandle);
+  return {apk.IsGoodZip(), apk.IsApk(), apk.IsGoodApk(), result == 0};
+}
+
+// The package without a dex file whose manifest is this text.
+PackageOptions WithoutDexListedBy(const std::string& text) {
+  PackageOptions options = WithoutDex();
+  options.edit_manifest = [=](const std::string&) { return text; };
+  return options;
+}
+
+// ---- The flags after Init: one test for each row of how far it can get.
+
+TEST(ApkInit, WithoutDescriptorAndPathAllFlagsAreFalse) {
+  LogCapture log;
+  Apk apk(-1);
+  EXPECT_EQ(log.records(),
+            Records({Error("Can't initialize Apk: need valid file descriptor or filename\n")}));
+  EXPECT_EQ(StateOf(apk), (State{false, false, false, false}));
+  EXPECT_EQ(apk.GetFd(), -1);
+  EXPECT_EQ(apk.GetPath(), "");
+}
+
+TEST(ApkInit, AFileThatIsNotAZipLeavesANullHandle) {
+  LogCapture log;
+  OpenPackage no_zip(ToBytes("This is not a zip archive, but a text."));
+  const std::string fd = std::to_string(no_zip.file.fd());
+  EXPECT_EQ(log.records(), Records({Error("OpenArchiveFd(" + fd + ") [file: " +
+                                          "/memfd:test (deleted)] returned: -3: Invalid file\n")}));
+  EXPECT_EQ(StateOf(no_zip.apk), (State{false, false, false, false}));
+}
+
+TEST(ApkInit, AJarIsAGoodZipWhoseSignatureIsNotExamined) {
+  Package jar = MakePackage(PlainJar());
+  jar.Tamper("META-INF/CERT.SF");
+  LogCapture log;
+  OpenPackage open(jar);
+  EXPECT_EQ(log.records(), Records({Error("Can't extract Android Manifest: Entry not found\n")}));
+  EXPECT_EQ(StateOf(open.apk), (State{true, false, false, true}));
+  EXPECT_TRUE(open.apk.GetManufacturerKey().empty());
+}
+
+TEST(ApkInit, APackageThatDoesNotVerifyIsAPackageThatIsNotGood) {
+  Package package = MakePackage(WithoutDex());
+  package.Tamper(kManifestName);
+  LogCapture log;
+  OpenPackage open(package);
+  EXPECT_EQ(StateOf(open.apk), (State{true, true, false, true}));
+}
+
+TEST(ApkInit, AGoodPackageHasAllFlagsAndNoMessage) {
+  LogCapture log;
+  OpenPackage open(WithoutDex());
+  EXPECT_EQ(log.records(), Records());
+  EXPECT_EQ(StateOf(open.apk), (State{true, true, true, true}));
+  EXPECT_EQ(open.apk.GetPackageName(), "com.example.app");
+  EXPECT_EQ(open.apk.GetManufacturerKey(), ModulusOf("rsa-2048"));
+  EXPECT_FALSE(open.apk.IsSsPermissionRequired());
+}
+
+// ---- Descriptor and path.
+
+TEST(ApkInit, ThePathIsTheOneThatTheDescriptorResolvesTo) {
+  OpenPackage open(WithoutDex());
+  EXPECT_EQ(open.apk.GetPath(), open.file.path());
+  EXPECT_EQ(open.apk.GetFd(), open.file.fd());
+}
+
+TEST(ApkInit, AGivenPathIsKeptBesideTheDescriptor) {
+  LogCapture log;
+  Apk apk(-1);
+  MemoryFile file(MakePackage(WithoutDex()).Build());
+  apk.Init(file.fd(), "/data/app/base.apk");
+  EXPECT_EQ(apk.GetPath(), "/data/app/base.apk");
+  EXPECT_EQ(apk.GetFd(), file.fd());
+  EXPECT_EQ(StateOf(apk), (State{true, true, true, true}));
+}
+
+TEST(ApkInit, WithAPathAloneTheFileIsOpened) {
+  LogCapture log;
+  Apk apk(-1);
+  log.Clear();
+  DiskFile file(MakePackage(WithoutDex()).Build());
+  apk.Init(-1, file.path().c_str());
+  EXPECT_EQ(log.records(), Records());
+  EXPECT_EQ(apk.GetPath(), file.path());
+  EXPECT_GT(apk.GetFd(), 0);
+  EXPECT_EQ(StateOf(apk), (State{true, true, true, true}));
+}
+
+TEST(ApkInit, APathThatCannotBeOpenedIsReported) {
+  LogCapture log;
+  Apk apk(-1);
+  log.Clear();
+  apk.Init(-1, "/nowhere/base.apk");
+  EXPECT_EQ(log.records(),
+            Records({Error("open('/nowhere/base.apk') failed: No such file or directory\n")}));
+  EXPECT_EQ(apk.GetFd(), -1);
+  EXPECT_EQ(StateOf(apk), (State{false, false, false, false}));
+}
+
+TEST(ApkInit, DescriptorZeroFromItsOwnOpenCountsAsAFailure) {
+  DiskFile file(MakePackage(WithoutDex()).Build());
+  LogCapture log;
+  Apk apk(-1);
+  log.Clear();
+  const int standard_input = dup(0);
+  close(0);
+  errno = 0;
+  apk.Init(-1, file.path().c_str());
+  dup2(standard_input, 0);
+  close(standard_input);
+  EXPECT_EQ(log.records(), Records({Error("open('" + file.path() + "') failed: Success\n")}));
+  EXPECT_EQ(apk.GetFd(), 0);
+  EXPECT_EQ(StateOf(apk), (State{false, false, false, false}));
+}
+
+TEST(ApkInit, AnyOtherNegativeDescriptorIsUsedUnchangedWhenThereIsAPath) {
+  DiskFile file(MakePackage(WithoutDex()).Build());
+  LogCapture log;
+  Apk apk(-1);
+  log.Clear();
+  apk.Init(-2, file.path().c_str());
+  EXPECT_EQ(log.records(), Records({Error("OpenArchiveFd(-2) [file: " + file.path() +
+                                          "] returned: -3: Invalid file\n")}));
+  EXPECT_EQ(apk.GetFd(), -2);
+}
+
+TEST(ApkInit, TheCallersDescriptorStaysOpen) {
+  MemoryFile file(MakePackage(WithoutDex()).Build());
+  { Apk apk(file.fd()); }
+  EXPECT_NE(fcntl(file.fd(), F_GETFD), -1);
+}
+
+TEST(ApkInit, ASecondInitStartsFromClearedFlags) {
+  PackageOptions options = WithoutDex();
+  options.secure_storage = true;
+  OpenPackage open(options);
+  ASSERT_EQ(StateOf(open.apk), (State{true, true, true, true}));
+  ASSERT_TRUE(open.apk.IsSsPermissionRequired());
+
+  LogCapture log;
+  MemoryFile no_zip(ToBytes("no zip"));
+  open.apk.Init(no_zip.fd(), nullptr);
+  EXPECT_EQ(StateOf(open.apk), (State{false, false, false, false}));
+  EXPECT_FALSE(open.apk.IsSsPermissionRequired());
+}
+
+TEST(ApkInit, ASecondInitForgetsTheFirstOnesDigests) {
+  PackageOptions first = WithoutDex();
+  first.entries.push_back({"lib/only.so", ToBytes("only")});
+  OpenPackage open(first);
+  DiskFile disk(ToBytes("only"));
+  ASSERT_TRUE(open.apk.VerifyFileHash("lib/only.so", disk.path()));
+
+  MemoryFile second(MakePackage(WithoutDex()).Build());
+  open.apk.Init(second.fd(), nullptr);
+  ASSERT_TRUE(open.apk.IsGoodApk());
+  LogCapture log;
+  EXPECT_FALSE(open.apk.VerifyFileHash("lib/only.so", disk.path()));
+}
+
+// The road of the second package ends where its manifest has been loaded already.
+TEST(ApkInit, ASecondInitThatFailsAfterLoadingItsManifestHasNoDigests) {
+  PackageOptions first = WithoutDex();
+  first.entries.push_back({"lib/only.so", ToBytes("only")});
+  OpenPackage open(first);
+  DiskFile disk(ToBytes("only"));
+
+  PackageOptions bad = WithoutDex();
+  bad.android_manifest = ToBytes("no compiled manifest");
+  MemoryFile second(MakePackage(bad).Build());
+  LogCapture log;
+  open.apk.Init(second.fd(), nullptr);
+  ASSERT_EQ(log.records().back(), Error("Can't process Android Manifest.\n"));
+  for (const char* name : {"lib/only.so", "lib/arm64-v8a/libfoo.so"}) {
+    log.Clear();
+    EXPECT_FALSE(open.apk.VerifyFileHash(name, disk.path()));
+    EXPECT_EQ(
+        log.records(),
+        Records({Error(std::string("Can't find file in META-INF/MANIFEST.MF: ") + name + "\n")}));
+  }
+}
+
+// ---- The road of a package, step by step.
+
+TEST(ApkInit, APackageWithoutManifestIsNotGoodAndSaysNothing) {
+  Package package = MakePackage(WithoutDex());
+  package.Remove(kManifestName);
+  LogCapture log;
+  OpenPackage open(package);
+  EXPECT_EQ(log.records(), Records());
+  EXPECT_EQ(StateOf(open.apk), (State{true, true, false, true}));
+}
+
+TEST(ApkInit, TheNameOfTheManifestIsReadThroughItsPointer) {
+  Package package = MakePackage(WithoutDex());
+  package.Item(kManifestName).name = "META-INF/OTHER.MF";
+  const char* const usual = Apk::kMANIFEST_MF;
+  Apk::kMANIFEST_MF = "META-INF/OTHER.MF";
+  OpenPackage renamed(package);
+  Apk::kMANIFEST_MF = usual;
+  EXPECT_TRUE(renamed.apk.IsGoodApk());
+
+  OpenPackage usually(package);
+  EXPECT_FALSE(usually.apk.IsGoodApk());
+}
+
+TEST(ApkInit, ATamperedManifestIsReportedTwice) {
+  Package package = MakePackage(WithoutDex());
+  package.Tamper(kManifestName);
+  LogCapture log;
+  OpenPackage open(package);
+  EXPECT_EQ(log.records(),
+            Records({Error("Can't validate manifest.\n"), Error("Can't validate manifest.\n")}));
+  EXPECT_EQ(StateOf(open.apk), (State{true, true, false, true}));
+}
+
+TEST(ApkInit, AManifestThatCannotBeParsedIsReportedWithItsSize) {
+  LogCapture log;
+  OpenPackage open(WithoutDexListedBy("Key:x"));
+  EXPECT_EQ(log.records(),
+            Records({Error("Parse manifest: Error: P_COLON: unexpected 0x78 after colon: x\n"),
+                     Error("Can't load manifest: size=5\n")}));
+  EXPECT_EQ(StateOf(open.apk), (State{true, true, false, true}));
+}
+
+TEST(ApkInit, TheManifestTextHoldsItsNulBytes) {
+  LogCapture log;
+  OpenPackage open(WithoutDexListedBy(std::string("A: 1\r\n\r\nB\0C: 2\r\n\r\n", 19)));
+  EXPECT_EQ(log.records(),
+            Records({Error("Parse manifest: Error: P_KEY: unexpected end of file after key 'B'\n"),
+                     Error("Can't load manifest: size=19\n")}));
+}
+
+TEST(ApkInit, AnAndroidManifestThatIsNotCompiledXmlIsReported) {
+  PackageOptions options = WithoutDex();
+  options.android_manifest = ToBytes("<manifest package='com.example.app'/>");
+  LogCapture log;
+  OpenPackage open(options);
+  EXPECT_EQ(log.records().size(), 2u);
+  EXPECT_EQ(log.records().back(), Error("Can't process Android Manifest.\n"));
+  EXPECT_EQ(StateOf(open.apk), (State{true, true, false, true}));
+}
+
+TEST(ApkInit, AManifestWithoutSectionsMakesAGoodPackage) {
+  OpenPackage open(WithoutDexListedBy(""));
+  EXPECT_EQ(StateOf(open.apk), (State{true, true, true, true}));
+}
+
+// ---- The digests that the manifest records.
+
+// The package whose manifest has this one section, or these two.
+PackageOptions WithSections(const JarText& sections) {
+  return WithoutDexListedBy(JarText::Manifest().EndSection().text() + sections.text());
+}
+
+// A section for "a" with the SHA-1 digest of one content and the SHA-256 digest of another.
+JarText TwoDigests(const std::string& sha1_of, const std::string& sha256_of) {
+  return JarText()
+      .Attribute("Name", "a")
+      .Digests({"SHA-256-Digest"}, ToBytes(sha256_of))
+      .Digests({"SHA1-Digest"}, ToBytes(sha1_of))
+      .EndSection();
+}
+
+TEST(ApkDigests, OfTwoDigestsInASectionSha1IsRecorded) {
+  DiskFile disk(ToBytes("right"));
+  OpenPackage open(WithSections(TwoDigests("right", "wrong")));
+  EXPECT_TRUE(open.apk.VerifyFileHash("a", disk.path()));
+}
+
+TEST(ApkDigests, OfTwoDigestsInASectionSha256IsNotConsulted) {
+  DiskFile disk(ToBytes("right"));
+  OpenPackage open(WithSections(TwoDigests("wrong", "right")));
+  EXPECT_FALSE(open.apk.VerifyFileHash("a", disk.path()));
+}
+
+}  // namespace

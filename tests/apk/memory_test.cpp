@@ -1,0 +1,120 @@
+// How much memory hostile and large packages make the process take. Each is opened in a process of
+// its own, since the peak of a process never falls.
+#include <fcntl.h>
+#include <gtest/gtest.h>
+#include <sys/wait.h>
+#include <unistd.h>
+
+#include <fstream>
+#include <functional>
+#include <random>
+
+#include "support/jar.h"
+#include "support/log_capture.h"
+#include "support/open_package.h"
+
+namespace {
+
+constexpr long kMegabyte = 1 << 10;  // kilobytes
+
+// What AddressSanitizer keeps of freed memory for a while.
+#ifndef __has_feature
+#define __has_feature(feature) 0
+#endif
+constexpr long kKept = __has_feature(address_sanitizer) ? 256 * kMegabyte : 0;
+
+// The most memory that the process has had, in kilobytes.
+long PeakMemory() {
+  std::ifstream status("/proc/self/status");
+  for (std::string word; status >> word;) {
+    if (long kilobytes; word == "VmHWM:" && status >> kilobytes) return kilobytes;
+  }
+  return -1;
+}
+
+// By how much the peak grows with `task`, in kilobytes; -1 when the process dies or `task` answers
+// false.
+long PeakGrowth(const std::function<bool()>& task) {
+  int ends[2];
+  EXPECT_EQ(pipe(ends), 0);
+  const pid_t child = fork();
+  if (child == 0) {
+    LogCapture log;
+    const long before = PeakMemory();
+    const long growth = task() ? PeakMemory() - before : -1;
+    _exit(write(ends[1], &growth, sizeof(growth)) == sizeof(growth) ? 0 : 1);
+  }
+  close(ends[1]);
+  long growth = -1;
+  EXPECT_EQ(read(ends[0], &growth, sizeof(growth)), static_cast<ssize_t>(sizeof(growth)));
+  close(ends[0]);
+  int status;
+  EXPECT_EQ(waitpid(child, &status, 0), child);
+  EXPECT_EQ(status, 0);
+  return growth;
+}
+
+long GrowthOfOpening(const Bytes& archive) {
+  return PeakGrowth([&] { return !OpenPackage(archive).apk.IsApk(); });
+}
+
+constexpr long kLittleMemory = 100 * kMegabyte;  // where the lie is of 4 GB
+
+TEST(ApkMemory, GarbageThatDeclaresGigabytesTouchesLittle) {
+  ZipItem item{kAndroidManifestName, {}, true};
+  std::mt19937 random(1);
+  item.raw = Bytes(4200000);
+  for (uint8_t& byte : *item.raw) byte = static_cast<uint8_t>(random());
+  const long growth = GrowthOfOpening(BuildZip({ClaimingLength(item, 0xfffffffe)}));
+  EXPECT_GE(growth, 0);
+  EXPECT_LT(growth, kLittleMemory);
+}
+
+TEST(ApkMemory, AFewBytesThatDeclareGigabytesTouchLittle) {
+  const ZipItem item{kAndroidManifestName, Bytes(100, 0), true};
+  const long growth = GrowthOfOpening(BuildZip({ClaimingLength(item, 0xfffffffe)}));
+  EXPECT_GE(growth, 0);
+  EXPECT_LT(growth, kLittleMemory);
+}
+
+// A signature file of 40 MB in 40 kB, all of one section that repeats one name: no more than the
+// text and its copy on the way.
+TEST(ApkMemory, NamesThatRepeatTakeNone) {
+  Package package = MakePackage(WithoutDex());
+  ZipItem& signature_file = package.Item("META-INF/CERT.SF");
+  signature_file.deflated = true;
+  signature_file.data.clear();
+  while (signature_file.data.size() < 40000000) {
+    for (const char c : {'A', ':', ' ', '1', '\n'}) signature_file.data.push_back(c);
+  }
+  const Bytes archive = package.Build();
+  const long growth = PeakGrowth([&] { return !OpenPackage(archive).apk.IsGoodApk(); });
+  EXPECT_GE(growth, 39 * kMegabyte);
+  EXPECT_LT(growth, 60 * kMegabyte + kKept);
+}
+
+// One library at a time, whichever way their sizes go.
+TEST(ApkMemory, LibrariesTakeTheLargestOnesSize) {
+  PackageOptions options = WithoutDex();
+  TempDir folder;
+  for (const size_t megabytes : {40, 60, 20, 50}) {
+    const std::string name = std::to_string(megabytes);
+    Bytes content(megabytes << 20, 0);
+    folder.Write(name, content);
+    options.entries.push_back({name, std::move(content), true});
+  }
+  const Bytes archive = MakePackage(options).Build();
+  options = {};
+  const long growth = PeakGrowth([&] {
+    OpenPackage open(archive);
+    bool good = true;
+    for (const char* name : {"40", "60", "20", "50"}) {
+      good = open.apk.VerifyFileHash(name, folder / name) && good;
+    }
+    return good;
+  });
+  EXPECT_GE(growth, 60 * kMegabyte);
+  EXPECT_LT(growth, 80 * kMegabyte + kKept);
+}
+
+}  // namespace

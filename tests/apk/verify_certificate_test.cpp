@@ -1,0 +1,250 @@
+// The signature block of a package: whose key it holds, and what that key signed.
+#include <gtest/gtest.h>
+
+#include <algorithm>
+
+#include "apk/package_log.h"
+#include "support/certificate.h"
+#include "support/jar.h"
+#include "support/signature_block.h"
+
+using ApkTools::Apk;
+
+namespace {
+
+constexpr char kNotVerified[] = "file not verified: META-INF/CERT.SF\n";
+
+PackageOptions WithBlock(const SignatureBlock& block) {
+  PackageOptions options;
+  options.block = block;
+  return options;
+}
+
+TEST(VerifyCertificate, EveryDigestASignerMayUseVerifies) {
+  for (const Digest digest : {Digest::kMd5, Digest::kSha1, Digest::kSha256}) {
+    SignatureBlock block;
+    block.digest = digest;
+    EXPECT_EQ(LogOf(WithBlock(block)), Records());
+  }
+}
+
+TEST(VerifyCertificate, KeysFrom1024To4096BitsVerifyAndBecomeTheManufacturerKey) {
+  for (const char* key : {"rsa-1024", "rsa-1536", "rsa-2048", "rsa-3072", "rsa-4096"}) {
+    SignatureBlock block;
+    block.key = key;
+    OpenPackage open(WithBlock(block));
+    EXPECT_TRUE(open.apk.IsGoodApk()) << key;
+    EXPECT_EQ(open.apk.GetManufacturerKey(), ModulusOf(key));
+  }
+}
+
+TEST(VerifyCertificate, A2048BitKeyIsKeptAs256Bytes) {
+  OpenPackage open{PackageOptions()};
+  EXPECT_EQ(open.apk.GetManufacturerKey().size(), 256u);
+}
+
+TEST(VerifyCertificate, ExponentsOfOneByteVerify) {
+  for (const char* key : {"rsa-2048-e3", "rsa-2048-e17"}) {
+    SignatureBlock block;
+    block.key = key;
+    EXPECT_EQ(LogOf(WithBlock(block)), Records()) << key;
+  }
+}
+
+TEST(VerifyCertificate, WhatIsNoSignatureBlockIsAnUnknownType) {
+  Package package = MakePackage();
+  package.Item("META-INF/CERT.RSA").data = ToBytes("no block");
+  testing::internal::CaptureStdout();
+  EXPECT_EQ(LogOf(package), Records({Error("Unknown certificate type"), Error(kNotVerified)}));
+  EXPECT_NE(testing::internal::GetCapturedStdout(), "");
+}
+
+TEST(VerifyCertificate, AnEmptyBlockIsAnUnknownType) {
+  Package package = MakePackage();
+  package.Item("META-INF/CERT.RSA").data = {};
+  testing::internal::CaptureStdout();
+  EXPECT_EQ(LogOf(package), Records({Error("Unknown certificate type"), Error(kNotVerified)}));
+  testing::internal::GetCapturedStdout();
+}
+
+TEST(VerifyCertificate, AnEllipticCurveKeyIsAnUnknownType) {
+  SignatureBlock block;
+  block.key = "ec-p256";
+  testing::internal::CaptureStdout();
+  EXPECT_EQ(LogOf(WithBlock(block)),
+            Records({Error("Unknown certificate type"), Error(kNotVerified)}));
+  testing::internal::GetCapturedStdout();
+}
+
+TEST(VerifyCertificate, ACertificateOfAnotherIssuerFailsThoughTheSignatureIsGood) {
+  SignatureBlock block;
+  block.issuer_key = "rsa-2048-other";
+  const Records records = LogOf(WithBlock(block));
+  ASSERT_FALSE(records.empty());
+  // What the other key's signature decrypts to is no padding (7), or is not below the modulus (5).
+  EXPECT_TRUE(
+      records == Records({Error("RSA could not verify certificate: 7\n"), Error(kNotVerified)}) ||
+      records == Records({Error("RSA could not verify certificate: 5\n"), Error(kNotVerified)}));
+}
+
+TEST(VerifyCertificate, ASignatureOverOtherBytesFails) {
+  SignatureBlock block;
+  block.wrong_digest = true;
+  EXPECT_EQ(LogOf(WithBlock(block)),
+            Records({Error("SHA256 hash does not match"), Error("RSA could not verify data: 12\n"),
+                     Error(kNotVerified)}));
+}
+
+TEST(VerifyCertificate, AuthenticatedAttributesFail) {
+  SignatureBlock block;
+  block.authenticated_attributes = true;
+  const Records records = LogOf(WithBlock(block));
+  ASSERT_EQ(records.size(), 2u);
+  EXPECT_EQ(records[0].text.rfind("RSA could not verify data: ", 0), 0u) << records[0];
+  EXPECT_EQ(records[1], Error(kNotVerified));
+}
+
+// A certificate with this RSAPublicKey, and a signature that fills the block.
+SignatureBlock WithPublicKey(const Bytes& modulus, const Bytes& exponent, size_t signature_length) {
+  Certificate certificate;
+  certificate.public_key_info =
+      PublicKeyInfoAround(der::Sequence({der::Integer(modulus), der::Integer(exponent)}));
+  certificate.signature = der::BitString(Bytes(signature_length, 1));
+  SignatureBlock block;
+  block.certificates = certificate.Build();
+  return block;
+}
+
+TEST(VerifyCertificate, AKeyOf2048BytesAlreadyFailsAtTheCertificate) {
+  EXPECT_EQ(LogOf(WithBlock(WithPublicKey(Bytes(2048, 0x55), {1, 0, 1}, 2048))),
+            Records({Error("RSA could not verify certificate: 5\n"), Error(kNotVerified)}));
+}
+
+TEST(VerifyCertificate, AnEmptyKeyFailsAtTheCertificate) {
+  // An INTEGER of two bytes, 0 and 1, is the one-byte modulus 1; its length bounds the exponent.
+  EXPECT_EQ(LogOf(WithBlock(WithPublicKey({0, 1}, {}, 256))),
+            Records({Error("RSA could not verify certificate: 5\n"), Error(kNotVerified)}));
+}
+
+TEST(VerifyCertificate, AnExponentThatRunsIntoTheModulusLengthStaysInTheBlock) {
+  for (const Bytes& length : {FromHex("ffffff7f"), FromHex("ffffffff"), FromHex("00100000")}) {
+    const Bytes exponent = Concat({FromHex("01000100"), length});
+    EXPECT_EQ(LogOf(WithBlock(WithPublicKey(Bytes(256, 0x55), exponent, 256))),
+              Records({Error("RSA could not set key: 5\n"), Error(kNotVerified)}));
+  }
+}
+
+TEST(VerifyCertificate, AModulusThatEndsWithTheBlockIsRead) {
+  // The exponent's second half says how long the modulus is: up to the block's last byte, then one
+  // more.
+  const auto block_with_length = [](uint32_t length) {
+    Bytes exponent = FromHex("01000100");
+    for (int i = 0; i < 4; ++i) exponent.push_back(static_cast<uint8_t>(length >> (8 * i)));
+    SignatureBlock block = WithPublicKey(Bytes(256, 0x55), exponent, 256);
+    block.encrypted_digest = der::OctetString(Bytes(256, 1));
+    return block;
+  };
+  const Bytes bytes = block_with_length(0).Build({});
+  const Bytes modulus(256, 0x55);
+  const auto start = std::search(bytes.begin(), bytes.end(), modulus.begin(), modulus.end());
+  const auto rest = static_cast<uint32_t>(bytes.end() - start);
+
+  EXPECT_EQ(LogOf(WithBlock(block_with_length(rest))),
+            Records({Error("RSA could not verify certificate: 5\n"), Error(kNotVerified)}));
+  EXPECT_EQ(LogOf(WithBlock(block_with_length(rest + 1))),
+            Records({Error("RSA could not set key: 5\n"), Error(kNotVerified)}));
+}
+
+TEST(VerifyCertificate, ACertificateSignatureThatTheBlockEndsBeforeFails) {
+  SignatureBlock block = WithPublicKey(Bytes(512, 0x55), {1, 0, 1}, 1);
+  block.encrypted_digest = der::OctetString({1});
+  EXPECT_EQ(LogOf(WithBlock(block)),
+            Records({Error("RSA could not verify certificate: 5\n"), Error(kNotVerified)}));
+}
+
+TEST(VerifyCertificate, ASignatureThatTheBlockEndsBeforeFails) {
+  SignatureBlock block;
+  block.encrypted_digest = der::OctetString({1});
+  EXPECT_EQ(LogOf(WithBlock(block)),
+            Records({Error("RSA could not verify data: 5\n"), Error(kNotVerified)}));
+}
+
+// The package whose block holds, for the signature, what `encode` makes of it.
+template <typename Encode>
+PackageOptions WithEncodedSignature(Encode encode) {
+  PackageOptions options;
+  const Bytes signature_file = MakePackage(options).Item("META-INF/CERT.SF").data;
+  options.block.encrypted_digest = encode(SignWith("rsa-2048", Digest::kSha256, signature_file));
+  return options;
+}
+
+TEST(VerifyCertificate, ALongerSignatureStringIsReadAsFarAsTheKeyIsLong) {
+  EXPECT_EQ(LogOf(WithEncodedSignature([](Bytes signature) {
+              signature.push_back(0xaa);
+              return der::OctetString(signature);
+            })),
+            Records());
+}
+
+TEST(VerifyCertificate, AShorterSignatureStringIsReadBeyondItsEnd) {
+  EXPECT_EQ(LogOf(WithEncodedSignature([](const Bytes& signature) {
+              const Bytes shorter(signature.begin(), signature.end() - 1);
+              return Concat({der::OctetString(shorter), {signature.back()}});
+            })),
+            Records());
+}
+
+TEST(VerifyCertificate, AShorterSignatureStringAtTheBlocksEndFails) {
+  EXPECT_EQ(LogOf(WithEncodedSignature([](const Bytes& signature) {
+              return der::OctetString(Bytes(signature.begin(), signature.end() - 1));
+            })),
+            Records({Error("RSA could not verify data: 5\n"), Error(kNotVerified)}));
+}
+
+// VerifyCertificate by itself, on the block over this signature file.
+struct Verification {
+  bool verified;
+  Bytes key;
+};
+Verification Verify(SignatureBlock block, const std::string& covered, const std::string& claimed) {
+  LogCapture log;
+  Apk apk(-1);
+  Bytes bytes = block.Build(ToBytes(covered));
+  Bytes sha1 = DigestOf(Digest::kSha1, ToBytes(claimed));
+  Bytes sha256 = DigestOf(Digest::kSha256, ToBytes(claimed));
+  Bytes md5 = DigestOf(Digest::kMd5, ToBytes(claimed));
+  Verification result{false, ToBytes("before")};
+  result.verified = apk.VerifyCertificate(bytes, sha1, sha256, md5, result.key);
+  return result;
+}
+
+TEST(VerifyCertificate, TheKeyIsReplacedOnSuccess) {
+  const Verification result = Verify({}, "signature file", "signature file");
+  EXPECT_TRUE(result.verified);
+  EXPECT_EQ(result.key, ModulusOf("rsa-2048"));
+}
+
+TEST(VerifyCertificate, TheKeyIsUntouchedOnFailure) {
+  const Verification result = Verify({}, "signature file", "other file");
+  EXPECT_FALSE(result.verified);
+  EXPECT_EQ(result.key, ToBytes("before"));
+}
+
+TEST(VerifyCertificate, ABlockCutShortAnywhereFailsWithoutHarm) {
+  const Bytes whole = SignatureBlock().Build(ToBytes("signature file"));
+  Bytes sha1 = DigestOf(Digest::kSha1, ToBytes("signature file"));
+  Bytes sha256 = DigestOf(Digest::kSha256, ToBytes("signature file"));
+  Bytes md5 = DigestOf(Digest::kMd5, ToBytes("signature file"));
+  LogCapture log;
+  Apk apk(-1);
+  testing::internal::CaptureStdout();
+  for (size_t length = 0; length < whole.size(); ++length) {
+    Bytes cut(whole.begin(), whole.begin() + static_cast<ptrdiff_t>(length));
+    cut.shrink_to_fit();
+    Bytes key;
+    EXPECT_FALSE(apk.VerifyCertificate(cut, sha1, sha256, md5, key)) << length;
+  }
+  testing::internal::GetCapturedStdout();
+}
+
+}  // namespace
