@@ -5,7 +5,6 @@
 #include "apk/base64.h"
 #include "apk/extraction.h"
 #include "apk/zip_library.h"
-#include "util/file.h"
 #include "util/log.h"
 
 namespace ApkTools {
@@ -36,9 +35,9 @@ bool Apk::VerifyEntryHash(const std::string& name, ZipEntry& entry) {
                        [&] { return ExtractZipEntry(zip_handle_, &entry, content) == 0; });
 }
 
-bool Apk::VerifyFileHash(const std::string& name, const std::string& path) {
+bool Apk::VerifyFileHash(const std::string& name, const std::string& path, FileIdentity* identity) {
   std::vector<uint8_t> content;
-  return VerifyContent(name, content, [&] { return ReadFile(path, content); });
+  return VerifyContent(name, content, [&] { return ReadFile(path, content, identity); });
 }
 
 // `read_content` fills `content`, and answers whether it could; it is not called for a name that

@@ -11,6 +11,7 @@
 #include <atomic>
 #include <filesystem>
 #include <fstream>
+#include <map>
 #include <memory>
 #include <optional>
 #include <sstream>
@@ -31,7 +32,7 @@ namespace {
 
 // A run may hold, at its worst moment, this many bytes for each byte of the archive and of what its
 // entries declare, and as much besides for what does not depend on either.
-constexpr size_t kBytesPerByte = 64;
+constexpr size_t kBytesPerByte = 16;
 constexpr size_t kBytesBesides = 1 << 20;
 
 std::vector<ZipArchiveHandle> open_archives;
@@ -47,10 +48,11 @@ class Installation {
     for (const char* const abi : {"arm", "arm64"}) {
       const std::string libraries = directory_ + "lib/" + abi + "/";
       std::filesystem::create_directories(libraries);
-      WriteFile(libraries + "libfoo.so", ToBytes("\177ELF foo"));
-      WriteFile(libraries + "libbar.so", ToBytes("\177ELF bar"));
+      files_[libraries + "libfoo.so"] = ToBytes("\177ELF foo");
+      files_[libraries + "libbar.so"] = ToBytes("\177ELF bar");
     }
-    WriteFile(root_ + "/outside.so", ToBytes("\177ELF foo"));
+    files_[root_ + "/outside.so"] = ToBytes("\177ELF foo");
+    for (const auto& [path, content] : files_) WriteFile(path, content);
   }
   ~Installation() { std::filesystem::remove_all(root_); }
   Installation(const Installation&) = delete;
@@ -59,12 +61,27 @@ class Installation {
   const std::string& directory() const { return directory_; }
   std::string package() const { return directory_ + "base.apk"; }
 
+  // Puts another file in the library's place, until all are put back.
+  void Exchange(const std::string& path) {
+    const auto file = files_.find(std::filesystem::weakly_canonical(path).string());
+    if (file == files_.end()) return;
+    WriteFile(root_ + "/other", ToBytes("\177ELF other"));
+    std::filesystem::rename(root_ + "/other", file->first);
+    exchanged_.push_back(file->first);
+  }
+  void PutBack() {
+    for (const std::string& path : exchanged_) WriteFile(path, files_.at(path));
+    exchanged_.clear();
+  }
+
  private:
   std::string root_, directory_;
+  std::map<std::string, Bytes> files_;
+  std::vector<std::string> exchanged_;
 };
 
-const Installation& TheInstallation() {
-  static const Installation installation;
+Installation& TheInstallation() {
+  static Installation installation;
   return installation;
 }
 
@@ -159,6 +176,19 @@ class Judge {
   std::optional<PackageModel> model_;
 };
 
+// Exchanges each library as it is opened for the second time, between its check and its signing.
+class Attacker {
+ public:
+  void BeforeOpen(const std::string& path) {
+    is_measured = false;
+    if (++opens_[path] == 2) TheInstallation().Exchange(path);
+    is_measured = true;
+  }
+
+ private:
+  std::map<std::string, int> opens_;
+};
+
 void SetUp(Phone& phone, uint8_t choices) {
   if ((choices & 1) != 0) phone.verify_errno = ENOKEY;
   if ((choices & 2) != 0) phone.zu_attribute_size = 1;
@@ -166,7 +196,7 @@ void SetUp(Phone& phone, uint8_t choices) {
   if ((choices & 8) != 0) phone.integrity = {"ffffffff\n", "0\n"};
   if ((choices & 16) != 0) phone.integrity = {"ffffffff\n", "1f\n"};
   if ((choices & 32) != 0) phone.zu_result = 0x10004;
-  if ((choices & 64) != 0) phone.has_integrity_file = false;
+  if ((choices & 64) != 0) phone.integrity = {Phone::kNoFile};
 }
 
 void RunTool(const std::string& path) {
@@ -211,7 +241,12 @@ extern "C" int LLVMFuzzerTestOneInput(const uint8_t* data, size_t size) {
   SetUp(phone, data[0]);
   Judge judge(archive, phone);
   phone.witness = [&](int fd, const std::string& event) { judge.Witness(fd, event); };
+  Attacker attacker;
+  if ((data[0] & 128) != 0) {
+    phone.before_open = [&](const char* opened, int) { attacker.BeforeOpen(opened); };
+  }
   RunTool(path);
+  TheInstallation().PutBack();
   if (most_held > kBytesBesides) {
     Require(most_held <= kBytesBesides + kBytesPerByte * (size + DeclaredBytes(archive)),
             "memory is bounded by what the file holds and declares");

@@ -21,7 +21,9 @@ bool IsOnReadOnlyFileSystem(int fd) {
 
 int main(int argc, char* argv[]) {
   if (argc != 2) return 1;
-  const int fd = open(argv[1], O_RDONLY);
+  // Deliberate: without waiting. A FIFO is a file that is no archive, and not one to wait for until
+  // somebody writes to it.
+  const int fd = open(argv[1], O_RDONLY | O_NONBLOCK);
   // Deliberate: descriptor 0 is refused like a failed open. A caller that closed standard input
   // did not set this process up as the install path does.
   if (fd < 1) return 0;

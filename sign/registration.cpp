@@ -74,7 +74,8 @@ std::vector<uint8_t> JarKeyBlock(const std::string& path) {
   return block;
 }
 
-// Deliberate: the location of `fd` serves for this message alone; the registration goes ahead.
+// Deliberate: the location of `fd` serves for this message alone; the registration goes ahead. The
+// text says "oat" of packages and JARs alike, as readers of the log know it.
 void ReportMissingLocation(int fd) {
   if (GetFilenameByFd(fd).empty()) LogError("Can't get oat location from fd=%d\n", fd);
 }

@@ -1,7 +1,6 @@
 #include "sign/signing.h"
 
 #include <fcntl.h>
-#include <unistd.h>
 
 #include <algorithm>
 #include <cerrno>
@@ -11,7 +10,9 @@
 
 #include "sign/integrity.h"
 #include "util/digest.h"
+#include "util/file.h"
 #include "util/log.h"
+#include "util/scoped_fd.h"
 
 namespace {
 
@@ -21,6 +22,7 @@ uint32_t SignAsJar(ApkTools::Apk& apk, int fd);
 std::vector<uint8_t> SignPayload(const std::vector<uint8_t>& data);
 std::string InstalledLibraryPath(const std::string& package_path, const std::string& entry_name);
 void SignLibrary(ApkTools::Apk& apk, const std::string& entry_name, const std::string& target);
+void ReportNotVerified(const std::string& target);
 
 }  // namespace
 
@@ -68,7 +70,9 @@ uint32_t SignAsPackage(ApkTools::Apk& apk, int fd) {
   if (!apk.IsGoodApk()) return kVeltFailure;
   std::vector<uint8_t> digest;
   ComputeSHA256Digest(apk.GetManufacturerKey(), digest);
-  const uint32_t result = VeltSignFd(fd, SignPayload(digest).data());
+  // Lives on until errno was read.
+  const std::vector<uint8_t> payload = SignPayload(digest);
+  const uint32_t result = VeltSignFd(fd, payload.data());
   if (result != 0) {
     const int error = errno;
     LogError("VELT can't sign a file (result=%x, errno %d: %s).\n", result, error, strerror(error));
@@ -88,7 +92,8 @@ uint32_t SignAsJar(ApkTools::Apk& apk, int fd) {
             strerror(error));
     return result;
   }
-  result = VeltSignFd(fd, SignPayload({}).data());
+  const std::vector<uint8_t> payload = SignPayload({});
+  result = VeltSignFd(fd, payload.data());
   if (result != 0) {
     const int error = errno;
     LogError("VELT can't sign a non-APK file (result=%x, errno %d: %s).\n", result, error,
@@ -138,19 +143,29 @@ std::string InstalledLibraryPath(const std::string& package_path, const std::str
 }
 
 void SignLibrary(ApkTools::Apk& apk, const std::string& entry_name, const std::string& target) {
-  if (!apk.VerifyFileHash(entry_name, target)) {
-    LogError("VeltSignJni: File not verified: %s\n", target.c_str());
-    return;
-  }
-  const int library_fd = open(target.c_str(), O_RDONLY);
-  if (library_fd < 0) {
+  FileIdentity verified = {};
+  if (!apk.VerifyFileHash(entry_name, target, &verified)) return ReportNotVerified(target);
+
+  // Without waiting, should `target` be a FIFO by now.
+  const ScopedFd library(open(target.c_str(), O_RDONLY | O_NONBLOCK));
+  if (library.get() < 0) {
     const int error = errno;
+    // Deliberate: without a line end, as readers of the log know it.
     LogError("File %s is not opened", target.c_str());
     LogError("Error %d: %s.\n", error, strerror(error));
     return;
   }
-  VeltSignOat(apk, library_fd);
-  close(library_fd);
+  // Deliberate: signed is only the very file whose bytes were verified, unchanged since. An entry's
+  // name may lead into a folder that others write to (docs/decisions/the-file-that-was-read.md).
+  FileIdentity opened;
+  if (!IdentifyFile(library.get(), &opened) || !(opened == verified)) {
+    return ReportNotVerified(target);
+  }
+  VeltSignOat(apk, library.get());
+}
+
+void ReportNotVerified(const std::string& target) {
+  LogError("VeltSignJni: File not verified: %s\n", target.c_str());
 }
 
 }  // namespace

@@ -71,7 +71,7 @@ TEST(VeltSignFd, AValueThatSettlesToZeroMayNotSign) {
 
 TEST(VeltSignFd, AMissingIntegrityFileMayNotSign) {
   Phone phone;
-  phone.has_integrity_file = false;
+  phone.integrity = {Phone::kNoFile};
   EXPECT_EQ(VeltSignFd(7, kPayload), 0x10000U);
   EXPECT_EQ(phone.events, Events({kSelf}));
 }
@@ -82,6 +82,23 @@ TEST(VeltSignFd, TheRefusalOfTheKernelKeepsItsErrno) {
   errno = 0;
   EXPECT_EQ(VeltSignFd(7, kPayload), 0x10000U);
   EXPECT_EQ(errno, EPERM);
+}
+
+// 0 alone is success, in either direction.
+TEST(VeltSignFd, AnyOtherAnswerOfTheKernelIsAFailure) {
+  for (const int answer : {1, -2, 0x10000}) {
+    Phone phone;
+    phone.kernel_result = answer;
+    EXPECT_EQ(VeltSignFd(7, kPayload), 0x10000U) << answer;
+    EXPECT_EQ(VeltVerifyFd(7), 0x10000U) << answer;
+  }
+}
+
+TEST(VeltSignFd, AFileThatIsGoneAfterTheWaitMayNotSign) {
+  Phone phone;
+  phone.integrity = {"ffffffff\n", Phone::kNoFile};
+  EXPECT_EQ(VeltSignFd(7, kPayload), 0x10000U);
+  EXPECT_EQ(phone.events, Events({kSelf, "sleep 10000", kSelf}));
 }
 
 TEST(VeltVerifyFd, ATrustedFileGivesZeroWithoutAskingForTheOwnIntegrity) {
@@ -182,9 +199,18 @@ TEST(VeltTaskReadIntegrity, AFileThatGoesBadWhileWaitingFailsWithTheLastValueRea
   EXPECT_EQ(phone.events, Events({kSelf, "sleep 10000", kSelf}));
 }
 
+TEST(VeltTaskReadIntegrity, AFileThatIsGoneAfterTheWaitFailsWithTheLastValueRead) {
+  Phone phone;
+  phone.integrity = {"ffffffff\n", Phone::kNoFile};
+  uint32_t value = 5;
+  EXPECT_EQ(VeltTaskReadIntegrity(0, 1, &value), 0x10000U);
+  EXPECT_EQ(value, 0xFFFFFFFFU);
+  EXPECT_EQ(phone.events, Events({kSelf, "sleep 10000", kSelf}));
+}
+
 TEST(VeltTaskReadIntegrity, WritesNothingToTheLog) {
   Phone phone;
-  phone.has_integrity_file = false;
+  phone.integrity = {Phone::kNoFile};
   LogCapture log;
   uint32_t value = 5;
   EXPECT_EQ(VeltTaskReadIntegrity(0, 1, &value), 0x10000U);

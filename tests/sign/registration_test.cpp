@@ -118,6 +118,14 @@ TEST(ZuSign, AJarWithoutTheAttributeIsLeftAlone) {
   EXPECT_EQ(file.log.records(), Records());
 }
 
+// Only its size matters, and that of the first descriptor's file.
+TEST(ZuSign, TheAttributeIsAskedOfTheFirstDescriptorWithoutABuffer) {
+  ArchiveOnPhone file(MakePackage(PlainJar()));
+  file.phone.zu_attribute_size = 1;
+  ZuSign(file.apk, file.fd(), 78);
+  EXPECT_EQ(file.phone.attributes, Events({std::to_string(file.fd()) + " user.zu null 0"}));
+}
+
 TEST(ZuSign, AJarWithAnEmptyAttributeIsLeftAlone) {
   ArchiveOnPhone file(MakePackage(PlainJar()));
   file.phone.zu_attribute_size = 0;

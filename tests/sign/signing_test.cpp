@@ -203,6 +203,30 @@ TEST(VeltSignJni, TheDescriptorOfALibraryIsClosed) {
   EXPECT_EQ(fcntl(file.fd() + 1, F_GETFD), -1);
 }
 
+TEST(VeltSignJni, ALibraryIsOpenedWithoutWaiting) {
+  const ZipItem library = Library("lib/arm64-v8a/libfoo.so");
+  PackageOnPhone file(MakePackage(WithLibraries({library})));
+  file.Install("lib/arm64/libfoo.so", library);
+  std::vector<int> flags;
+  file.phone.before_open = [&](const char*, int given) { flags.push_back(given); };
+  file.SignJni();
+  EXPECT_EQ(flags, std::vector<int>({O_RDONLY | O_NONBLOCK | O_CLOEXEC, O_RDONLY | O_NONBLOCK}));
+}
+
+// What lies among the libraries and is none is left alone, though the manifest lists it.
+TEST(VeltSignJni, AnEntryOfAnotherEndingIsNoLibrary) {
+  const std::vector<ZipItem> others = {Library("lib/arm64-v8a/libfoo.so.txt"),
+                                       Library("lib/arm64-v8a/libfoo.SO"),
+                                       Library("lib/arm64-v8a/so")};
+  PackageOnPhone file(MakePackage(WithLibraries(others)));
+  for (const ZipItem& other : others) {
+    file.Install("lib/arm64/" + other.name.substr(other.name.rfind('/') + 1), other);
+  }
+  EXPECT_EQ(file.SignJni(), 0U);
+  EXPECT_EQ(file.phone.events, Events());
+  EXPECT_EQ(file.log.records(), Records({Starts(file.fd()), Finished()}));
+}
+
 TEST(VeltSignJni, APackageWithoutLibrariesSignsNothing) {
   PackageOnPhone file(MakePackage(WithLibraries({})));
   EXPECT_EQ(file.SignJni(), 0U);
@@ -339,6 +363,30 @@ TEST(VeltSignJni, ARefusalOfTheKernelDoesNotChangeTheResult) {
             Records({Starts(file.fd()), Info("VeltSignOat: Apk case.\n"),
                      Error("VELT can't sign a file (result=10000, errno 13: Permission denied).\n"),
                      Finished()}));
+}
+
+// By then the file is another one: nothing is signed, and nothing stays open.
+TEST(VeltSignJni, ALibraryThatIsAnotherFileAfterItsCheckIsNotSigned) {
+  const ZipItem library = Library("lib/arm64-v8a/libfoo.so");
+  PackageOnPhone file(MakePackage(WithLibraries({library})));
+  file.Install("lib/arm64/libfoo.so", library);
+  file.Install("other", library);
+  int opens = 0;
+  file.phone.before_open = [&](const char* path, int) {
+    if (++opens < 2) return;
+    EXPECT_EQ(rename(file.Path("other").c_str(), path), 0);
+  };
+  const int next = dup(0);
+  close(next);
+  EXPECT_EQ(file.SignJni(), 0U);
+  EXPECT_EQ(dup(0), next);
+  close(next);
+  EXPECT_EQ(file.phone.events, Events());
+  EXPECT_EQ(
+      file.log.records(),
+      Records({Starts(file.fd()),
+               Error("VeltSignJni: File not verified: " + file.Path("lib/arm64/libfoo.so") + "\n"),
+               Finished()}));
 }
 
 // The file goes away between the check and the opening: the reading of the file is the only open

@@ -34,7 +34,7 @@ void Note(int fd, const std::string& event) {
 }
 
 int AnswerWith(int error) {
-  if (error == 0) return 0;
+  if (error == 0) return phone->kernel_result;
   errno = error;
   return -1;
 }
@@ -67,6 +67,7 @@ ssize_t __real_readlink(const char* path, char* buffer, size_t size);
 
 // Nothing that is linked with a Phone makes files by open(), so there is no mode to pass on.
 int __wrap_open(const char* path, int flags, ...) {
+  if (phone != nullptr && phone->before_open) phone->before_open(path, flags);
   if (phone == nullptr || phone->opens_before_failure < 0) return __real_open(path, flags);
   if (phone->opens_before_failure-- > 0) return __real_open(path, flags);
   phone->opens_before_failure = 0;
@@ -77,11 +78,11 @@ int __wrap_open(const char* path, int flags, ...) {
 FILE* __wrap_fopen(const char* path, const char* mode) {
   if (phone == nullptr || !IsIntegrityFile(path)) return __real_fopen(path, mode);
   phone->events.push_back(std::string("integrity ") + path);
-  if (!phone->has_integrity_file) {
+  const std::string text = NextIntegrity();
+  if (text == Phone::kNoFile) {
     errno = ENOENT;
     return nullptr;
   }
-  const std::string text = NextIntegrity();
   FILE* file = tmpfile();
   if (file == nullptr) abort();
   fwrite(text.data(), 1, text.size(), file);
@@ -106,6 +107,10 @@ int __wrap_usleep(useconds_t microseconds) {
 }
 
 ssize_t __wrap_fgetxattr(int fd, const char* name, void* value, size_t size) {
+  if (phone != nullptr) {
+    phone->attributes.push_back(std::to_string(fd) + " " + name + " " +
+                                (value == nullptr ? "null " : "buffer ") + std::to_string(size));
+  }
   if (phone == nullptr || strcmp(name, "user.zu") != 0 || phone->zu_attribute_size < 0) {
     return __real_fgetxattr(fd, name, value, size);
   }

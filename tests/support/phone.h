@@ -19,8 +19,10 @@ struct Phone {
   Phone& operator=(const Phone&) = delete;
 
   // A healthy phone, to be changed by the test.
-  std::deque<std::string> integrity = {"1f\n"};  // file contents, one an opening; the last repeats
-  bool has_integrity_file = true;
+  // What the integrity file holds, one text an opening, the last of which repeats; kNoFile: there
+  // is none at that opening.
+  std::deque<std::string> integrity = {"1f\n"};
+  static constexpr char kNoFile[] = "no file";
   int sign_errno = 0;             // 0: the kernel signs
   int verify_errno = 0;           // 0: the kernel trusts every file
   int zu_result = 0;              // what libzu answers
@@ -28,6 +30,11 @@ struct Phone {
   std::vector<int> nameless_fds;  // descriptors whose path cannot be resolved
   int opens_before_failure =
       -1;  // open() succeeds so many times and then finds no file; -1: always
+  // What fcntl answers to a request to sign or to verify that is in order.
+  int kernel_result = 0;
+
+  // Called before each open().
+  std::function<void(const char* path, int flags)> before_open;
 
   // Called after each event that has a descriptor, while that is still open.
   std::function<void(int fd, const std::string& event)> witness;
@@ -35,4 +42,6 @@ struct Phone {
   // What the code under test did, in the order in which it did it: "integrity PATH", "sleep
   // MICROSECONDS", "sign FD PAYLOAD-HEX", "verify FD", "register FD NAME DATA-HEX".
   std::vector<std::string> events;
+  // The attributes that were asked for: "FD NAME VALUE-IS-NULL SIZE".
+  std::vector<std::string> attributes;
 };

@@ -336,6 +336,59 @@ class DeepDirectory {
   std::string path_;
 };
 
+// ---- Which file it is.
+
+TEST_F(ReadFileTest, TellsWhichFileItWasBeforeAByteWasRead) {
+  const std::string path = MakeFile("abc");
+  struct stat before;
+  ASSERT_EQ(stat(path.c_str(), &before), 0);
+  kernel.read = [&](int fd, void* buffer, size_t size) {
+    usleep(20000);  // the clock of file systems is coarse
+    std::ofstream(path, std::ios::app) << "more";
+    return __real_read(fd, buffer, size);
+  };
+  Bytes out;
+  FileIdentity identity;
+  ASSERT_TRUE(ReadFile(path, out, &identity));
+  EXPECT_TRUE(identity ==
+              (FileIdentity{before.st_dev, before.st_ino, 3, before.st_mtim, before.st_ctim}));
+  struct stat after;
+  ASSERT_EQ(stat(path.c_str(), &after), 0);
+  EXPECT_FALSE(identity == (FileIdentity{after.st_dev, after.st_ino, after.st_size, after.st_mtim,
+                                         after.st_ctim}));
+}
+
+TEST_F(ReadFileTest, LeavesTheIdentityAloneWhenItFails) {
+  LogCapture log;
+  Bytes out;
+  FileIdentity identity = {1, 2, 3, {4, 5}, {6, 7}};
+  EXPECT_FALSE(ReadFile(folder_.path(), out, &identity));
+  EXPECT_TRUE(identity == (FileIdentity{1, 2, 3, {4, 5}, {6, 7}}));
+}
+
+TEST(FileIdentityTest, EachOfItsPartsCounts) {
+  const FileIdentity whole = {1, 2, 3, {4, 5}, {6, 7}};
+  EXPECT_TRUE(whole == (FileIdentity{1, 2, 3, {4, 5}, {6, 7}}));
+  const FileIdentity others[] = {{9, 2, 3, {4, 5}, {6, 7}}, {1, 9, 3, {4, 5}, {6, 7}},
+                                 {1, 2, 9, {4, 5}, {6, 7}}, {1, 2, 3, {9, 5}, {6, 7}},
+                                 {1, 2, 3, {4, 9}, {6, 7}}, {1, 2, 3, {4, 5}, {9, 7}},
+                                 {1, 2, 3, {4, 5}, {6, 9}}};
+  for (const FileIdentity& other : others) EXPECT_FALSE(whole == other) << &other - others;
+}
+
+TEST_F(FileTest, OnlyARegularFileHasAnIdentity) {
+  const int folder = open(folder_.path().c_str(), O_RDONLY);
+  const int file = open(MakeFile("abc").c_str(), O_RDONLY);
+  FileIdentity identity = {};
+  EXPECT_FALSE(IdentifyFile(folder, &identity));
+  EXPECT_FALSE(IdentifyFile(-1, &identity));
+  EXPECT_TRUE(identity == FileIdentity());
+  EXPECT_TRUE(IdentifyFile(file, &identity));
+  EXPECT_EQ(identity.size, 3);
+  close(folder);
+  close(file);
+}
+
 TEST_F(GetFilenameByFdTest, TargetPathOf4094BytesIsWhole) {
   const DeepDirectory deep(folder_.path(), 4094);
   ASSERT_NE(-1, deep.fd());

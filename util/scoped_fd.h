@@ -1,0 +1,20 @@
+// A file descriptor that is closed when its scope ends.
+#pragma once
+
+#include <unistd.h>
+
+class ScopedFd {
+ public:
+  // Takes over `fd`; a negative one is none.
+  explicit ScopedFd(int fd) : fd_(fd) {}
+  ~ScopedFd() {
+    if (fd_ >= 0) close(fd_);
+  }
+  ScopedFd(const ScopedFd&) = delete;
+  ScopedFd& operator=(const ScopedFd&) = delete;
+
+  int get() const { return fd_; }
+
+ private:
+  const int fd_;
+};
