@@ -7,6 +7,8 @@
 
 namespace ApkTools {
 
+// Deliberate: a pointer that can be changed, and not the text itself. The name is looked up through
+// it at each use, so that one place decides which entry the manifest is.
 const char* Apk::kMANIFEST_MF = "META-INF/MANIFEST.MF";
 
 Apk::Apk(int fd) { Init(fd, nullptr); }
@@ -40,6 +42,7 @@ bool Apk::VerifyPackage(const std::vector<uint8_t>& android_manifest) {
 
   if (!InitCertSf()) return false;
   if (!ValidateManifest(manifest)) {
+    // Deliberate: ValidateManifest has said the same; readers of the log know the text as a pair.
     LogError("Can't validate manifest.\n");
     return false;
   }

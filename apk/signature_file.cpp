@@ -1,7 +1,4 @@
 // The package's signature: signature file, signature block, and the digest of the manifest.
-#include <openssl/md5.h>
-#include <openssl/sha.h>
-
 #include <cstring>
 #include <string_view>
 #include <utility>
@@ -20,8 +17,9 @@ namespace {
 
 std::string SignatureBlockName(const std::string& signature_file_name);
 bool FitsInBlock(const std::vector<uint8_t>& block, const uint8_t* start, size_t length);
-int VerifySignature(rsa_context& key, const std::vector<uint8_t>& block, const uint8_t* sha1,
-                    const uint8_t* sha256, const uint8_t* md5, const uint8_t* signature);
+int LoadKey(const std::vector<uint8_t>& block, const pkcs7& record, rsa_context& key);
+int VerifySignature(const rsa_context& key, const std::vector<uint8_t>& block,
+                    const Digests& digests, const uint8_t* signature);
 
 // A key that is wiped and released with its owner.
 struct ScopedRsaKey {
@@ -41,10 +39,7 @@ bool Apk::InitCertSf() {
   std::string name;
   std::vector<uint8_t> content;
   if (!ExtractSignatureFile(name, content)) return false;
-  std::vector<uint8_t> sha1, sha256, md5;
-  ComputeSHA1Digest(content, sha1);
-  ComputeSHA256Digest(content, sha256);
-  ComputeMD5Digest(content, md5);
+  Digests digests = ComputeDigests(content);
   if (!cert_sf_.load(std::move(content))) return false;
 
   const std::string block_name = SignatureBlockName(name);
@@ -53,7 +48,7 @@ bool Apk::InitCertSf() {
     LogError("Can't extract RSA certificate: %s\n", block_name.c_str());
     return false;
   }
-  if (!VerifyCertificate(block, sha1, sha256, md5, manufacturer_key_)) {
+  if (!VerifyCertificate(block, digests.sha1, digests.sha256, digests.md5, manufacturer_key_)) {
     LogError("file not verified: %s\n", name.c_str());
     return false;
   }
@@ -75,40 +70,32 @@ bool Apk::VerifyCertificate(std::vector<uint8_t>& block, std::vector<uint8_t>& s
                             std::vector<uint8_t>& key) {
   pkcs7 record = {};
   if (processCert(block.data(), static_cast<uint32_t>(block.size()), &record) != 0) {
+    // Deliberate: without a line end, as readers of the log know it.
     LogError("Unknown certificate type");
     return false;
   }
-  uint8_t tbs_sha1[SHA_DIGEST_LENGTH], tbs_md5[MD5_DIGEST_LENGTH], tbs_sha256[SHA256_DIGEST_LENGTH];
-  SHA1(record.tbs_data, record.tbs_data_length, tbs_sha1);
-  MD5(record.tbs_data, record.tbs_data_length, tbs_md5);
-  SHA256(record.tbs_data, record.tbs_data_length, tbs_sha256);
-
-  // The record's four bytes, read as they are: right for one-byte exponents and for 65537.
-  uint32_t exponent;
-  memcpy(&exponent, record.exponent, sizeof(exponent));
   ScopedRsaKey rsa;
-  int result = kRsaBadInput;
-  if (FitsInBlock(block, record.modulus, record.modulus_length)) {
-    result = rsa_set_key(&rsa.context, record.modulus, nullptr, exponent, record.modulus_length);
-  }
+  int result = LoadKey(block, record, rsa.context);
   if (result != 0) {
     LogError("RSA could not set key: %X\n", static_cast<unsigned>(result));
     return false;
   }
   // Deliberate: the certificate's own key must have signed it. Who issued it is not asked, there is
   // no store of trusted issuers.
-  result =
-      VerifySignature(rsa.context, block, tbs_sha1, tbs_sha256, tbs_md5, record.cert_signature);
+  const uint8_t* const tbs = record.tbs_data;
+  const Digests tbs_digests = ComputeDigests({tbs, tbs + record.tbs_data_length});
+  result = VerifySignature(rsa.context, block, tbs_digests, record.cert_signature);
   if (result != 0) {
     LogError("RSA could not verify certificate: %X\n", static_cast<unsigned>(result));
     return false;
   }
-  result = VerifySignature(rsa.context, block, sha1.data(), sha256.data(), md5.data(),
-                           record.signed_digest);
+  result = VerifySignature(rsa.context, block, {sha1, sha256, md5}, record.signed_digest);
   if (result != 0) {
     LogError("RSA could not verify data: %X\n", static_cast<unsigned>(result));
     return false;
   }
+  // Deliberate: keys as long as this never verify above, so that no test gets here. The guard stays
+  // for what takes the key, which has room for no more.
   if (record.modulus_length > kLongestKey) return false;
   key.assign(record.modulus, record.modulus + record.modulus_length);
   return true;
@@ -135,7 +122,9 @@ bool Apk::ValidateManifest(const std::vector<uint8_t>& manifest) {
 
 bool Apk::VerifyData(const std::string& digest_name, const std::vector<uint8_t>& expected,
                      const std::vector<uint8_t>& data) {
-  // Deliberate: neither MD5, which is broken, nor the longer digests, which no package carries.
+  // Deliberate: these two alone, one of which every manifest has that a package's signing tool
+  // wrote. What another tool may have chosen (MD5, SHA-512) is refused. It is otherwise with
+  // signatures: old packages have them over MD5, and those verify.
   struct Algorithm {
     const char* attribute;
     void (*compute)(const std::vector<uint8_t>&, std::vector<uint8_t>&);
@@ -169,12 +158,28 @@ bool FitsInBlock(const std::vector<uint8_t>& block, const uint8_t* start, size_t
   return offset <= block.size() && length <= block.size() - offset;
 }
 
+// Loads the record's key into `key`. Returns rsa_set_key's result, or bad input for a key that the
+// block ends before, and for an exponent of 1 or -1.
+int LoadKey(const std::vector<uint8_t>& block, const pkcs7& record, rsa_context& key) {
+  if (!FitsInBlock(block, record.modulus, record.modulus_length)) return kRsaBadInput;
+  // Deliberate: four bytes in the order of the host, though certificates have the high one first.
+  // That is right for the exponents that signing tools make, which have one byte or are 65537.
+  uint32_t exponent;
+  memcpy(&exponent, record.exponent, sizeof(exponent));
+  // Deliberate: of all exponents this one is judged, the sign being of no account (mpi_pow_mod). A
+  // number to the power of 1 is itself, so that everyone could write down signatures for any key.
+  const bool is_one = exponent == 1 || exponent == UINT32_MAX;
+  if (is_one) return kRsaBadInput;
+  return rsa_set_key(&key, record.modulus, nullptr, exponent, record.modulus_length);
+}
+
 // rsa_pkcs1_verify of a signature in the block, which is as long as the modulus whatever length the
 // block states; bad input where the block ends before it does.
-int VerifySignature(rsa_context& key, const std::vector<uint8_t>& block, const uint8_t* sha1,
-                    const uint8_t* sha256, const uint8_t* md5, const uint8_t* signature) {
+int VerifySignature(const rsa_context& key, const std::vector<uint8_t>& block,
+                    const Digests& digests, const uint8_t* signature) {
   if (!FitsInBlock(block, signature, static_cast<size_t>(key.len))) return kRsaBadInput;
-  return rsa_pkcs1_verify(&key, sha1, sha256, md5, signature);
+  return rsa_pkcs1_verify(&key, digests.sha1.data(), digests.sha256.data(), digests.md5.data(),
+                          signature);
 }
 
 }  // namespace

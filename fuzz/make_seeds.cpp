@@ -91,6 +91,10 @@ void MakeSignatureBlocks() {
   block = SmallBlock();
   block.issuer_key = "rsa-1024";
   Seed("signature_block", "issued", block.Build(signature_file));
+  for (const char* exponent : {"01", "ffffffff", "010000004000"}) {
+    Seed("signature_block", std::string("forged-") + exponent,
+         ForgedBlock(signature_file, kFuzzKey, FromHex(exponent)));
+  }
   Seed("signature_block", "e17", [&] {
     SignatureBlock other;
     other.key = "rsa-2048-e17";
@@ -164,7 +168,8 @@ void MakeCompiledManifests() {
   Seed("compiled_manifest", "bad-node", CompiledXml().Start("manifest").BadNode().Build());
 }
 
-// The first byte says what the phone is like: 0 is a healthy one, 2 gives the file "user.zu".
+// The first byte says what the phone is like: 0 is a healthy one, 2 gives the file "user.zu", on
+// 128 an attacker exchanges libraries.
 void SeedPackage(const std::string& name, const PackageOptions& options, uint8_t phone = 0) {
   Seed("package", name, Concat({{phone}, MakePackage(options).Build()}));
 }
@@ -173,6 +178,7 @@ void MakePackages() {
   PackageOptions options;
   options.block = SmallBlock();
   SeedPackage("good", options);
+  SeedPackage("exchanged", options, 128);
   options.secure_storage = true;
   options.digests = options.signature_file_digests = {"SHA1-Digest", "SHA-256-Digest"};
   SeedPackage("registered", options);

@@ -17,3 +17,11 @@ void ComputeSHA256Digest(const std::vector<uint8_t>& in, std::vector<uint8_t>& o
   out.resize(SHA256_DIGEST_LENGTH);
   SHA256(in.data(), in.size(), out.data());
 }
+
+Digests ComputeDigests(const std::vector<uint8_t>& in) {
+  Digests digests;
+  ComputeSHA1Digest(in, digests.sha1);
+  ComputeSHA256Digest(in, digests.sha256);
+  ComputeMD5Digest(in, digests.md5);
+  return digests;
+}

@@ -14,3 +14,13 @@ void ComputeMD5Digest(const std::vector<uint8_t>& in, std::vector<uint8_t>& out)
 void ComputeSHA1Digest(const std::vector<uint8_t>& in, std::vector<uint8_t>& out);
 // 32 bytes.
 void ComputeSHA256Digest(const std::vector<uint8_t>& in, std::vector<uint8_t>& out);
+
+// The digests that a signature may be over. Which of them it is, the signature itself tells.
+struct Digests {
+  std::vector<uint8_t> sha1;
+  std::vector<uint8_t> sha256;
+  std::vector<uint8_t> md5;
+};
+
+// All three of `in`.
+Digests ComputeDigests(const std::vector<uint8_t>& in);

@@ -1,5 +1,7 @@
 #include "support/signature_block.h"
 
+#include "support/package.h"
+
 namespace {
 
 constexpr char kData[] = "1.2.840.113549.1.7.1";
@@ -63,4 +65,19 @@ Bytes SignatureBlock::SignerInfo(const Bytes& signature_file) const {
       encrypted_digest.has_value() ? *encrypted_digest
                                    : der::OctetString(SignWith(key, digest, signed_bytes)),
   });
+}
+
+Bytes ForgedBlock(const Bytes& signature_file, const std::string& victim, const Bytes& exponent) {
+  const Bytes modulus = ModulusOf(victim);
+  Certificate certificate;
+  certificate.public_key_info = PublicKeyInfoAround(
+      der::Sequence({der::Integer(Concat({{0}, modulus})), der::Integer(exponent)}));
+  const auto encoded = [&](const Bytes& data) {
+    return EncodedMessage(Digest::kSha256, data, modulus.size());
+  };
+  certificate.signature = der::BitString(encoded(certificate.Tbs()));
+  SignatureBlock block;
+  block.certificates = certificate.Build();
+  block.encrypted_digest = der::OctetString(encoded(signature_file));
+  return block.Build(signature_file);
 }

@@ -39,3 +39,8 @@ struct SignatureBlock {
   Bytes SignedData(const Bytes& signature_file) const;
   Bytes SignerInfo(const Bytes& signature_file) const;
 };
+
+// The block over the signature file as somebody makes it who knows no more of the RSA test key
+// `victim` than everyone does, and writes the encoded messages themselves where signatures belong:
+// good ones, if these contents of the exponent INTEGER leave them as they are.
+Bytes ForgedBlock(const Bytes& signature_file, const std::string& victim, const Bytes& exponent);

@@ -90,4 +90,12 @@ TEST(Digest, Sha256IntoAVectorOfFortyBytesMakesItThirtyTwoLong) {
   EXPECT_EQ(32U, out.size());
 }
 
+TEST(Digests, EachIsTheOneThatItsNameSays) {
+  const Digests digests = ComputeDigests(ToBytes("abc"));
+  EXPECT_EQ("a9993e364706816aba3e25717850c26c9cd0d89d", Hex(digests.sha1));
+  EXPECT_EQ("ba7816bf8f01cfea414140de5dae2223b00361a396177a9cb410ff61f20015ad",
+            Hex(digests.sha256));
+  EXPECT_EQ("900150983cd24fb0d6963f7d28e17f72", Hex(digests.md5));
+}
+
 }  // namespace
