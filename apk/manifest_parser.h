@@ -28,8 +28,8 @@ class ManifestParser {
   ManifestParser(std::vector<uint8_t>& text, ManifestSections& sections, State state = P_START)
       : text_(text.data()), size_(text.size()), sections_(sections), state_(state) {}
 
-  // To the end of the text. False, and logged, when a name has no colon before a NUL or the end, and
-  // when another byte than a space, a CR or an LF follows a colon.
+  // To the end of the text. False, and logged, when a name has no colon before a NUL or the end,
+  // and when another byte than a space, a CR or an LF follows a colon.
   bool parse();
 
  private:

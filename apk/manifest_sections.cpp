@@ -27,8 +27,8 @@ std::string_view ManifestSection::find(std::string_view name) const {
 }
 
 // Deliberate: of several digests the last in the order of names counts, so that "SHA1-Digest" goes
-// before "SHA-256-Digest", for an entry as for the whole manifest. It is the order in which packages
-// that carry both have always been judged.
+// before "SHA-256-Digest", for an entry as for the whole manifest. It is the order in which
+// packages that carry both have always been judged.
 ManifestSection::value_type ManifestSection::findLastEndingIn(std::string_view suffix) const {
   for (size_t i = size_; i > 0; --i) {
     if (EndsWith(View(text_, attributes_[i - 1].name), suffix)) return (*this)[i - 1];
@@ -53,8 +53,9 @@ void ManifestSections::reset(const uint8_t* text, size_t size) {
   patience_ = kFewAttributes;
 }
 
-// A section that has doubled is put in order, which drops what repeats: so it takes memory for twice
-// its names at the most, and the time for it stays that of putting each name in order a few times.
+// A section that has doubled is put in order, which drops what repeats: so it takes memory for
+// twice its names at the most, and the time for it stays that of putting each name in order a few
+// times.
 void ManifestSections::add(const ManifestAttribute& attribute) {
   attributes_.push_back(attribute);
   if (attributes_.size() - openStart() < patience_) return;

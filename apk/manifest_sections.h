@@ -98,6 +98,6 @@ class ManifestSections {
 
   const char* text_ = nullptr;
   std::vector<ManifestAttribute> attributes_;
-  std::vector<uint32_t> ends_;          // of each section in attributes_
-  size_t patience_ = kFewAttributes;    // so many attributes in the section at hand are too many
+  std::vector<uint32_t> ends_;        // of each section in attributes_
+  size_t patience_ = kFewAttributes;  // so many attributes in the section at hand are too many
 };

@@ -224,6 +224,23 @@ TEST(AndroidManifestAttribute, AStringWithoutTextIsPassedOverForALaterString) {
             (Facts{"b", false}));
 }
 
+// The raw value is the text as it stood in the source; what counts is what it was compiled to.
+TEST(AndroidManifestAttribute, WhatIsNoStringIsMissingThoughItHasARawText) {
+  for (XmlAttribute attribute :
+       {ReferenceAttribute("package", 0x7f010000), IntAttribute("package", 7)}) {
+    attribute.has_raw = true;
+    attribute.text = "raw";
+    EXPECT_EQ(Read(CompiledXml().Element("manifest", {attribute})), (Facts{"", false}));
+  }
+}
+
+TEST(AndroidManifestAttribute, OneWithoutANameIsPassedOver) {
+  XmlAttribute nameless = Package("wrong");
+  nameless.has_name = false;
+  EXPECT_EQ(Read(CompiledXml().Element("manifest", {nameless, Package("right")})),
+            (Facts{"right", false}));
+}
+
 TEST(AndroidManifestAttribute, ALoneStringWithoutTextIsMissing) {
   EXPECT_EQ(Read(CompiledXml().Element("manifest", {StringAttributeWithoutText("package")})),
             (Facts{"", false}));

@@ -57,6 +57,18 @@ TEST(ApkInit, WithoutDescriptorAndPathAllFlagsAreFalse) {
   EXPECT_EQ(apk.GetPath(), "");
 }
 
+// No descriptor is asked for by a number below -1 either.
+TEST(ApkInit, ANegativeDescriptorWithoutAPathIsNone) {
+  LogCapture log;
+  Apk apk(-1);
+  log.Clear();
+  apk.Init(-2, nullptr);
+  EXPECT_EQ(log.records(),
+            Records({Error("Can't initialize Apk: need valid file descriptor or filename\n")}));
+  EXPECT_EQ(apk.GetFd(), -2);
+  EXPECT_EQ(StateOf(apk), (State{false, false, false, false}));
+}
+
 TEST(ApkInit, AFileThatIsNotAZipLeavesANullHandle) {
   LogCapture log;
   OpenPackage no_zip(ToBytes("This is not a zip archive, but a text."));
@@ -121,6 +133,8 @@ TEST(ApkInit, WithAPathAloneTheFileIsOpened) {
   EXPECT_EQ(log.records(), Records());
   EXPECT_EQ(apk.GetPath(), file.path());
   EXPECT_GT(apk.GetFd(), 0);
+  EXPECT_EQ(fcntl(apk.GetFd(), F_GETFD), FD_CLOEXEC);
+  EXPECT_EQ(fcntl(apk.GetFd(), F_GETFL) & O_ACCMODE, O_RDONLY);
   EXPECT_EQ(StateOf(apk), (State{true, true, true, true}));
 }
 
@@ -182,6 +196,25 @@ TEST(ApkInit, ASecondInitStartsFromClearedFlags) {
   EXPECT_FALSE(open.apk.IsSsPermissionRequired());
 }
 
+TEST(ApkInit, ASecondInitThatGetsNoFileHasNoArchive) {
+  OpenPackage open(WithoutDex());
+  LogCapture log;
+  open.apk.Init(-1, nullptr);
+  EXPECT_EQ(StateOf(open.apk), (State{false, false, false, false}));
+}
+
+TEST(ApkInit, ASecondInitForgetsThatTheFirstOnesDexWasGood) {
+  OpenPackage open{PackageOptions()};
+  ASSERT_TRUE(open.apk.IsGoodApk());
+  Package bad = MakePackage();
+  bad.Tamper("classes.dex");
+  MemoryFile second(bad.Build());
+  LogCapture log;
+  open.apk.Init(second.fd(), nullptr);
+  EXPECT_FALSE(open.apk.IsGoodApk());
+  EXPECT_EQ(log.records(), Records({Error("Integrity not confirmed: classes.dex\n")}));
+}
+
 TEST(ApkInit, ASecondInitForgetsTheFirstOnesDigests) {
   PackageOptions first = WithoutDex();
   first.entries.push_back({"lib/only.so", ToBytes("only")});
@@ -223,6 +256,17 @@ TEST(ApkInit, ASecondInitThatFailsAfterLoadingItsManifestHasNoDigests) {
 TEST(ApkInit, APackageWithoutManifestIsNotGoodAndSaysNothing) {
   Package package = MakePackage(WithoutDex());
   package.Remove(kManifestName);
+  LogCapture log;
+  OpenPackage open(package);
+  EXPECT_EQ(log.records(), Records());
+  EXPECT_EQ(StateOf(open.apk), (State{true, true, false, true}));
+}
+
+// The manifest is asked for before the signature file and its block, of which nothing is said then.
+TEST(ApkInit, APackageWithoutManifestAndBlockSaysNothingOfEither) {
+  Package package = MakePackage(WithoutDex());
+  package.Remove(kManifestName);
+  package.Remove("META-INF/CERT.RSA");
   LogCapture log;
   OpenPackage open(package);
   EXPECT_EQ(log.records(), Records());
@@ -277,6 +321,26 @@ TEST(ApkInit, AnAndroidManifestThatIsNotCompiledXmlIsReported) {
   EXPECT_EQ(log.records().size(), 2u);
   EXPECT_EQ(log.records().back(), Error("Can't process Android Manifest.\n"));
   EXPECT_EQ(StateOf(open.apk), (State{true, true, false, true}));
+}
+
+// What the Android manifest says is not looked at before the manifest has been loaded.
+TEST(ApkInit, AnAndroidManifestIsReadOnlyAfterTheManifestWasLoaded) {
+  PackageOptions options = WithoutDexListedBy("Key:x");
+  options.secure_storage = true;
+  LogCapture log;
+  OpenPackage open(options);
+  EXPECT_EQ(log.records().back(), Error("Can't load manifest: size=5\n"));
+  EXPECT_EQ(open.apk.GetPackageName(), "");
+  EXPECT_FALSE(open.apk.IsSsPermissionRequired());
+}
+
+TEST(ApkInit, APackageWithoutANameIsGood) {
+  PackageOptions options = WithoutDex();
+  options.package_name = "";
+  LogCapture log;
+  OpenPackage open(options);
+  EXPECT_EQ(StateOf(open.apk), (State{true, true, true, true}));
+  EXPECT_EQ(open.apk.GetPackageName(), "");
 }
 
 TEST(ApkInit, AManifestWithoutSectionsMakesAGoodPackage) {

@@ -72,6 +72,16 @@ TEST(EntryDigests, OfEqualNamesTheLaterSectionCountsInAnyOrder) {
   EXPECT_EQ("SHA-256-Digest 3", unordered.Of("b"));
 }
 
+// More of them than any sort that is stable for few keeps in order.
+TEST(EntryDigests, OfManyEqualNamesTheLastSectionCounts) {
+  std::string sections = Section("z", "0");
+  for (int i = 1; i <= 100; ++i) sections += Section(i % 2 == 0 ? "a" : "b", std::to_string(i));
+  const Recorded recorded(sections);
+  EXPECT_EQ("SHA-256-Digest 100", recorded.Of("a"));
+  EXPECT_EQ("SHA-256-Digest 99", recorded.Of("b"));
+  EXPECT_EQ("SHA-256-Digest 0", recorded.Of("z"));
+}
+
 TEST(EntryDigests, ALaterSectionWithoutADigestReplacesNothing) {
   EXPECT_EQ("SHA-256-Digest 1", Recorded(Section("a", "1") + "Name: a\r\nX: 2\r\n\r\n").Of("a"));
 }

@@ -1,5 +1,6 @@
 // Single entries and files against the digests that the manifest records.
 #include <gtest/gtest.h>
+#include <sys/stat.h>
 #include <unistd.h>
 
 #include <algorithm>
@@ -126,6 +127,21 @@ TEST(IsGoodApk, ADexThatIsThereButCannotBeFoundIsBad) {
 
 TEST(IsGoodApk, ADexOfAnImpossibleLengthIsBad) {
   Package package = MakePackage();
+  ZipItem& dex = package.Item("classes.dex");
+  dex.deflated = true;
+  dex = ClaimingLength(dex, 0xfffffffe);
+  LogCapture log;
+  OpenPackage open(package);
+  EXPECT_FALSE(open.apk.IsGoodApk());
+  EXPECT_EQ(log.records(), Records({Error(kDexFailed)}));
+}
+
+// What cannot be extracted is not what the manifest lists, though that be nothing at all.
+TEST(IsGoodApk, ADexOfAnImpossibleLengthThatIsListedAsEmptyIsBad) {
+  PackageOptions options;
+  options.entries = {{"classes.dex", {}}};
+  Package package = MakePackage(options);
+  ASSERT_TRUE(OpenPackage(package).apk.IsGoodApk());
   ZipItem& dex = package.Item("classes.dex");
   dex.deflated = true;
   dex = ClaimingLength(dex, 0xfffffffe);
@@ -293,6 +309,28 @@ TEST(VerifyFileHash, AFileThatShrinksMeanwhileEndsInZeros) {
   WriteFile(file.path(), ToBytes("A second file"));
   EXPECT_TRUE(open.apk.VerifyFileHash("zeros", file.path()));
   before_read = nullptr;
+}
+
+TEST(VerifyFileHash, TellsWhichFileItRead) {
+  OpenPackage open{PackageOptions()};
+  DiskFile good(ToBytes("\177ELF foo")), bad(ToBytes("\177ELF bar"));
+  for (const DiskFile* file : {&good, &bad}) {
+    struct stat status;
+    ASSERT_EQ(stat(file->path().c_str(), &status), 0);
+    FileIdentity identity = {};
+    EXPECT_EQ(open.apk.VerifyFileHash(kLibrary, file->path(), &identity), file == &good);
+    EXPECT_EQ(identity.device, status.st_dev);
+    EXPECT_EQ(identity.inode, status.st_ino);
+  }
+}
+
+TEST(VerifyFileHash, TellsOfNoFileThatItDidNotRead) {
+  OpenPackage open{PackageOptions()};
+  FileIdentity identity = {};
+  LogCapture log;
+  EXPECT_FALSE(open.apk.VerifyFileHash(kLibrary, "/nowhere/libfoo.so", &identity));
+  EXPECT_TRUE(open.apk.VerifyFileHash("META-INF/CERT.SF", "/nowhere/libfoo.so", &identity));
+  EXPECT_TRUE(identity == FileIdentity());
 }
 
 TEST(VerifyFileHash, AFileListedWithMd5AloneIsUnsupported) {

@@ -36,7 +36,8 @@ class Table {
   ManifestPiece Put(const std::string& piece) {
     text_ += piece;
     EXPECT_LE(text_.size(), text_.capacity());
-    return {static_cast<uint32_t>(text_.size() - piece.size()), static_cast<uint32_t>(piece.size())};
+    return {static_cast<uint32_t>(text_.size() - piece.size()),
+            static_cast<uint32_t>(piece.size())};
   }
 
   std::string text_;
@@ -89,7 +90,12 @@ TEST(ManifestSection, FindsAnAttributeByItsWholeName) {
 
 TEST(ManifestSection, FindsTheLastNameThatEndsSo) {
   Table table;
-  table.Add("SHA1-X", "1").Add("SHA-256-X", "2").Add("Z", "3").Add("-Y", "4").Add("SHA9-XX", "5").End();
+  table.Add("SHA1-X", "1")
+      .Add("SHA-256-X", "2")
+      .Add("Z", "3")
+      .Add("-Y", "4")
+      .Add("SHA9-XX", "5")
+      .End();
   const ManifestSection section = table.sections[0];
   EXPECT_EQ(std::make_pair(std::string_view("SHA1-X"), std::string_view("1")),
             section.findLastEndingIn("-X"));
@@ -107,7 +113,8 @@ TEST(ManifestSection, OfEqualNamesTheLastInTheTextCounts) {
   for (int count : {2, 16, 17, 40, 500, 1, 5000, 63, 64, 65, 20000}) {
     expected.emplace_back();
     for (int i = 0; i < count; ++i) {
-      const std::string name = "name" + std::to_string(random() % (1 + static_cast<uint32_t>(count) / 4));
+      const std::string name =
+          "name" + std::to_string(random() % (1 + static_cast<uint32_t>(count) / 4));
       expected.back()[name] = std::to_string(i + 1);
       table.Add(name, std::to_string(i + 1));
     }

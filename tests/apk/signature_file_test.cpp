@@ -132,6 +132,18 @@ TEST(InitCertSf, OfTwoSignersTheFirstInTheArchivesOrderDecides) {
   EXPECT_EQ(open.apk.IsGoodApk(), name == "META-INF/OTHER.SF");
 }
 
+TEST(InitCertSf, ASignatureFileStaysLoadedWhenALaterStepFails) {
+  Package package = MakePackage();
+  const Bytes manifest = package.Item(kManifestName).data;
+  package.Remove("META-INF/CERT.RSA");
+  LogCapture log;
+  OpenPackage open(package);
+  ASSERT_FALSE(open.apk.IsGoodApk());
+  log.Clear();
+  EXPECT_TRUE(open.apk.ValidateManifest(manifest));
+  EXPECT_EQ(log.records(), Records());
+}
+
 TEST(InitCertSf, ATamperedSignatureFileIsNotVerified) {
   Package package = MakePackage();
   Bytes& text = package.Item("META-INF/CERT.SF").data;
@@ -231,6 +243,12 @@ TEST(ValidateManifest, ANameThatIsTheSuffixAloneIsAMatchWithoutAnAlgorithm) {
   EXPECT_EQ(LogOf(WithSignatureFile("-Digest-Manifest: AAAA\r\n\r\n")),
             Records({Error("verifyData: Unsupported digest type: -Digest\n"),
                      Error("Can't validate manifest.\n"), Error("Can't validate manifest.\n")}));
+}
+
+// An empty expected digest is no digest to compare with, of whatever kind.
+TEST(ValidateManifest, AnEmptyMd5DigestIsRefusedWithoutASayingOnMd5) {
+  EXPECT_EQ(LogOf(WithSignatureFile("MD5-Digest-Manifest: ====\r\n\r\n")),
+            Records({Error("Can't validate manifest.\n"), Error("Can't validate manifest.\n")}));
 }
 
 TEST(ValidateManifest, WithoutAValidSignatureFileItIsRefused) {

@@ -197,7 +197,7 @@ void CompiledXml::PutNodeHeader(uint16_t type, size_t extra_length) {
 void CompiledXml::PutAttribute(const XmlAttribute& attribute) {
   const uint32_t raw = attribute.has_raw ? Ref(attribute.text) : kNone;
   Put32(nodes_, attribute.name_space.empty() ? kNone : Ref(attribute.name_space));
-  Put32(nodes_, Ref(attribute.name));
+  Put32(nodes_, attribute.has_name ? Ref(attribute.name) : kNone);
   Put32(nodes_, raw);
   Put16(nodes_, 8);  // length of the typed value
   nodes_.push_back(0);

@@ -16,6 +16,7 @@ struct XmlAttribute {
   bool has_raw = false;    // whether there is a raw value
   uint32_t data = 0;       // the typed value of what is no string
   std::string name_space;  // its URI; empty for none
+  bool has_name = true;    // whether the name is in the string pool
 };
 
 inline constexpr char kAndroidNamespace[] = "http://schemas.android.com/apk/res/android";

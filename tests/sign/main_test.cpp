@@ -1,0 +1,47 @@
+// What main does before and around the three steps, as a process without a phone: its log goes to
+// standard error there.
+#include <gtest/gtest.h>
+#include <sys/stat.h>
+
+#include "support/files.h"
+#include "support/package.h"
+#include "support/process.h"
+#include "support/simulation.h"
+
+namespace {
+
+// Runs the tool by way of a shell, which gives it the file as $1 and is told what to do with it.
+ProcessResult RunTool(const std::string& command, const std::string& file) {
+  return RunProcess({"sh", "-c", command, ToolPath(), file});
+}
+
+bool Says(const ProcessResult& run, const std::string& text) {
+  return run.errors.find(text) != std::string::npos;
+}
+
+TEST(Main, WithStandardInputTheFileIsWorkedOn) {
+  const DiskFile file(MakePackage().Build());
+  const ProcessResult run = RunTool("\"$0\" \"$1\" </dev/null", file.path());
+  EXPECT_EQ(run.status, 0);
+  EXPECT_TRUE(Says(run, "VeltSignJni starts: 3.")) << run.errors;
+}
+
+// The file then gets descriptor 0.
+TEST(Main, WithoutStandardInputTheFileIsLeftAlone) {
+  const DiskFile file(MakePackage().Build());
+  const ProcessResult run = RunTool("\"$0\" \"$1\" <&-", file.path());
+  EXPECT_EQ(run.status, 0);
+  EXPECT_EQ(run.output + run.errors, "");
+}
+
+TEST(Main, AFifoIsNoArchiveAndNothingToWaitFor) {
+  const TempDir folder;
+  ASSERT_EQ(mkfifo((folder / "fifo").c_str(), 0600), 0);
+  const ProcessResult run = RunTool("timeout 20 \"$0\" \"$1\" </dev/null", folder / "fifo");
+  EXPECT_EQ(run.status, 0);
+  EXPECT_TRUE(Says(run, "OpenArchiveFd(3) [file: " + folder / "fifo" + "] returned: "))
+      << run.errors;
+  EXPECT_TRUE(Says(run, "Zip archive is not valid for fd=3")) << run.errors;
+}
+
+}  // namespace

@@ -1,0 +1,121 @@
+// What the zip library is asked, where its answers do not tell. The linker sends the calls of the
+// tool here (CMakeLists.txt names them as the compiler does) and they go on to the library.
+#include <gtest/gtest.h>
+
+#include "apk/zip_library.h"
+#include "sign/signing.h"
+#include "support/log_capture.h"
+#include "support/open_package.h"
+#include "support/phone.h"
+
+using ApkTools::Apk;
+
+namespace {
+
+struct ZipCalls {
+  std::vector<bool> ownership;       // of the descriptors that archives were opened on
+  std::vector<std::string> filters;  // "PREFIX SUFFIX" of each iteration that was started
+  std::vector<void*> archives;       // and the archive that it was started on
+  std::vector<void*> open_cookies;   // of iterations that were started and not ended
+} calls;
+
+template <typename Filter>
+std::string TextOf(const Filter& filter) {
+  if constexpr (std::is_pointer_v<Filter>) {
+    if (filter == nullptr) return "";
+    return std::string(reinterpret_cast<const char*>(filter->name), filter->name_length);
+  } else {
+    return std::string(filter);
+  }
+}
+
+#ifdef APKTOOLKIT_ZIPSTRING
+using Filter = const ZipString*;
+#else
+using Filter = std::string_view;
+#endif
+
+}  // namespace
+
+int32_t RealOpenArchiveFd(int, const char*, ZipArchiveHandle*,
+                          bool) __asm__("__real_" OPEN_ARCHIVE_FD);
+int32_t WrapOpenArchiveFd(int, const char*, ZipArchiveHandle*,
+                          bool) __asm__("__wrap_" OPEN_ARCHIVE_FD);
+int32_t RealStartIteration(ZipArchiveHandle, void**, Filter,
+                           Filter) __asm__("__real_" START_ITERATION);
+int32_t WrapStartIteration(ZipArchiveHandle, void**, Filter,
+                           Filter) __asm__("__wrap_" START_ITERATION);
+void RealEndIteration(void*) __asm__("__real_" END_ITERATION);
+void WrapEndIteration(void*) __asm__("__wrap_" END_ITERATION);
+
+int32_t WrapOpenArchiveFd(int fd, const char* name, ZipArchiveHandle* handle, bool ownership) {
+  calls.ownership.push_back(ownership);
+  return RealOpenArchiveFd(fd, name, handle, ownership);
+}
+
+int32_t WrapStartIteration(ZipArchiveHandle archive, void** cookie, Filter prefix, Filter suffix) {
+  calls.archives.push_back(archive);
+  calls.filters.push_back(TextOf(prefix) + " " + TextOf(suffix));
+  const int32_t result = RealStartIteration(archive, cookie, prefix, suffix);
+  if (result == 0) calls.open_cookies.push_back(*cookie);
+  return result;
+}
+
+void WrapEndIteration(void* cookie) {
+  auto& open = calls.open_cookies;
+  open.erase(std::remove(open.begin(), open.end(), cookie), open.end());
+  RealEndIteration(cookie);
+}
+
+namespace {
+
+class ZipCallsTest : public testing::Test {
+ protected:
+  ZipCallsTest() { calls = {}; }
+  LogCapture log_;
+  Phone phone_;
+};
+
+TEST_F(ZipCallsTest, ADescriptorThatWasGivenStaysTheCallers) {
+  OpenPackage open{PackageOptions()};
+  EXPECT_EQ(calls.ownership, std::vector<bool>({false}));
+}
+
+TEST_F(ZipCallsTest, ADescriptorThatInitOpenedIsTheArchives) {
+  const DiskFile file(MakePackage().Build());
+  Apk apk(-1);
+  apk.Init(-1, file.path().c_str());
+  EXPECT_EQ(calls.ownership, std::vector<bool>({true}));
+}
+
+TEST_F(ZipCallsTest, ADescriptorWithAPathStaysTheCallers) {
+  const DiskFile file(MakePackage().Build());
+  const MemoryFile memory(MakePackage().Build());
+  Apk apk(-1);
+  apk.Init(memory.fd(), file.path().c_str());
+  EXPECT_EQ(calls.ownership, std::vector<bool>({false}));
+}
+
+TEST_F(ZipCallsTest, AfterAnOpeningThatFailedThereIsNoArchive) {
+  OpenPackage open(ToBytes("This is not a zip archive, but a text."));
+  void* cookie = nullptr;
+  EXPECT_NE(open.apk.StartIteration(&cookie, "", ""), 0);
+  EXPECT_EQ(calls.archives, std::vector<void*>({nullptr}));
+}
+
+TEST_F(ZipCallsTest, TheSignatureFileAndTheLibrariesAreWalkedToAndTheWalksEnded) {
+  OpenPackage open(WithLibraries({{"lib/arm64-v8a/libfoo.so", ToBytes("foo")}}));
+  VeltSignJni(open.apk, open.file.fd(), "not used");
+  EXPECT_EQ(calls.filters, std::vector<std::string>({"META-INF/ .SF", "lib/ .so"}));
+  EXPECT_EQ(calls.open_cookies, std::vector<void*>());
+}
+
+TEST_F(ZipCallsTest, AWalkThatFindsNothingIsEndedAllTheSame) {
+  Package package = MakePackage();
+  package.Remove("META-INF/CERT.SF");
+  OpenPackage open(package);
+  EXPECT_EQ(calls.filters, std::vector<std::string>({"META-INF/ .SF"}));
+  EXPECT_EQ(calls.open_cookies, std::vector<void*>());
+}
+
+}  // namespace

@@ -1,0 +1,112 @@
+// What can be done with packages that aapt and apksigner made, against an install path that leaves
+// the JAR signature to this tool (docs/threat-model.md).
+#include <gtest/gtest.h>
+
+#include <filesystem>
+
+#include "support/certificate.h"
+#include "support/expected_timeline.h"
+#include "support/files.h"
+#include "support/package.h"
+#include "support/process.h"
+#include "support/signing_block.h"
+#include "support/simulation.h"
+
+namespace {
+
+std::string Made(const std::string& name) {
+  return std::filesystem::canonical(THREAT_PACKAGES).string() + "/" + name + "/base.apk";
+}
+
+// Both libraries of the package and the package itself signed for the key, then the key registered.
+std::string AllSignedAndRegistered(const std::string& apk, const std::string& key,
+                                   const std::string& name) {
+  const std::string folder = std::filesystem::path(apk).parent_path();
+  const Bytes payload = PackagePayload(key);
+  return Timeline({LibraryStep({SignedLibrary(folder + "/lib/arm64/libvault.so", payload),
+                                SignedLibrary(folder + "/lib/arm/libvault.so", payload)}),
+                   PackageStep(apk, payload), Register(3, apk, name, ModulusOf(key)),
+                   Log(4, "ZuAddCertificate: ZuNewCertificate return 0.\n"), Exit(0)});
+}
+
+// ---- Whom apksigner signs for, whatever the key.
+
+class KeyOfApksigner : public testing::TestWithParam<const char*> {};
+
+TEST_P(KeyOfApksigner, VerifiesAndIsRegistered) {
+  const std::string apk = Made(std::string("keys/") + GetParam());
+  EXPECT_EQ(Simulate(apk).timeline, AllSignedAndRegistered(apk, GetParam(), "com.example.vault"));
+}
+
+std::string NameOf(const testing::TestParamInfo<const char*>& info) {
+  std::string name = info.param;
+  for (size_t dash; (dash = name.find('-')) != std::string::npos;) name[dash] = '_';
+  return name;
+}
+
+INSTANTIATE_TEST_SUITE_P(Rsa, KeyOfApksigner,
+                         testing::Values("rsa-1024", "rsa-1536", "rsa-2048", "rsa-2048-e3",
+                                         "rsa-2048-e17", "rsa-2048-other", "rsa-3072", "rsa-4096"),
+                         NameOf);
+
+// ---- The newer signing block is the installer's; META-INF is nobody's but this tool's then.
+
+class ForeignMetaInf : public testing::TestWithParam<const char*> {
+ protected:
+  // The made package below the attacker's own signing block, its libraries beside it.
+  ForeignMetaInf() : apk_(folder_ / "base.apk") {
+    std::filesystem::copy(std::filesystem::path(Made(GetParam())).parent_path() / "lib",
+                          folder_ / "lib", std::filesystem::copy_options::recursive);
+    WriteFile(apk_, AddSigningBlock(ToBytes(ContentOf(Made(GetParam()))), "rsa-2048-other"));
+  }
+
+  TempDir folder_;
+  const std::string apk_;
+};
+
+TEST_P(ForeignMetaInf, PassesForTheAttackersPackageFromAndroid7On) {
+  const ProcessResult verdict = RunProcess(
+      {"apksigner", "verify", "--verbose", "--print-certs", "--min-sdk-version", "24", apk_});
+  EXPECT_EQ(verdict.status, 0) << verdict.output << verdict.errors;
+  EXPECT_NE(verdict.output.find("Verified using v2 scheme (APK Signature Scheme v2): true"),
+            std::string::npos)
+      << verdict.output;
+  EXPECT_NE(verdict.output.find("Signer #1 public key SHA-256 digest: " +
+                                Hex(DigestOf(Digest::kSha256, PublicKeyInfo("rsa-2048-other")))),
+            std::string::npos)
+      << verdict.output;
+}
+
+TEST_P(ForeignMetaInf, GetsTheVictimsPayloadAndTheVictimsKeyUnderTheAttackersName) {
+  EXPECT_EQ(Simulate(apk_).timeline, AllSignedAndRegistered(apk_, "rsa-2048", "com.evil.reader"));
+}
+
+INSTANTIATE_TEST_SUITE_P(Around, ForeignMetaInf, testing::Values("foreign", "no-dex"), NameOf);
+
+// The twin: around one's own META-INF nothing of the victim's is to be had.
+TEST(OwnMetaInf, GetsItsOwnPayload) {
+  const std::string apk = Made("keys/rsa-2048-other");
+  TempDir folder;
+  const std::string signed_again = folder / "base.apk";
+  std::filesystem::copy(std::filesystem::path(apk).parent_path() / "lib", folder / "lib",
+                        std::filesystem::copy_options::recursive);
+  WriteFile(signed_again, AddSigningBlock(ToBytes(ContentOf(apk)), "rsa-2048-other"));
+  EXPECT_EQ(Simulate(signed_again).timeline,
+            AllSignedAndRegistered(signed_again, "rsa-2048-other", "com.example.vault"));
+}
+
+// ---- Attributes are known by their local names.
+
+// The installer's name for it is com.evil.reader, and it requests no permission: it declares one.
+TEST(AttributeInAnotherNamespace, NamesAnotherPackageThanTheInstallerReads) {
+  const std::string apk = Made("attribute");
+  const ProcessResult installer = RunProcess({"aapt", "dump", "permissions", apk});
+  EXPECT_EQ(installer.output,
+            "package: com.evil.reader\npermission: com.qix.android.SECURE_STORAGE\n");
+  const std::string timeline = Simulate(apk).timeline;
+  EXPECT_NE(timeline.find(Register(3, apk, "com.victim.bank", ModulusOf("rsa-2048-other"))),
+            std::string::npos)
+      << timeline;
+}
+
+}  // namespace
