@@ -167,7 +167,8 @@ int LoadKey(const std::vector<uint8_t>& block, const pkcs7& record, rsa_context&
   uint32_t exponent;
   memcpy(&exponent, record.exponent, sizeof(exponent));
   // Deliberate: of all exponents this one is judged, the sign being of no account (mpi_pow_mod). A
-  // number to the power of 1 is itself, so that everyone could write down signatures for any key.
+  // number to the power of 1 is itself, so that everyone could write down signatures for any key
+  // (docs/decisions/exponent-of-one.md).
   const bool is_one = exponent == 1 || exponent == UINT32_MAX;
   if (is_one) return kRsaBadInput;
   return rsa_set_key(&key, record.modulus, nullptr, exponent, record.modulus_length);

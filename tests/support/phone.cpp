@@ -77,6 +77,7 @@ int __wrap_open(const char* path, int flags, ...) {
 
 FILE* __wrap_fopen(const char* path, const char* mode) {
   if (phone == nullptr || !IsIntegrityFile(path)) return __real_fopen(path, mode);
+  if (phone->before_integrity) phone->before_integrity();
   phone->events.push_back(std::string("integrity ") + path);
   const std::string text = NextIntegrity();
   if (text == Phone::kNoFile) {

@@ -33,6 +33,8 @@ struct Phone {
   // What fcntl answers to a request to sign or to verify that is in order.
   int kernel_result = 0;
 
+  // Called before the integrity file is opened: after all checks, and before the kernel signs.
+  std::function<void()> before_integrity;
   // Called before each open().
   std::function<void(const char* path, int flags)> before_open;
 

@@ -58,7 +58,7 @@ Bytes SignatureBlock::SignerInfo(const Bytes& signature_file) const {
   }
   return der::Sequence({
       der::Integer(1),
-      der::Sequence({certificate.issuer, certificate.serial}),
+      der::Sequence({certificate.issuer, serial.value_or(certificate.serial)}),
       digest_algorithm.value_or(AlgorithmIdentifier(DigestOid(digest))),
       attributes,
       AlgorithmIdentifier(kRsaEncryption),

@@ -17,6 +17,8 @@ struct SignatureBlock {
   Digest digest = Digest::kSha256;
   // The key that issued the signer's certificate; empty: its own.
   std::string issuer_key;
+  // The serial number by which the signer is known; not set: its certificate's.
+  std::optional<Bytes> serial;
   // The signature covers authenticated attributes, which hold the digest of the signature file.
   bool authenticated_attributes = false;
   // The signature covers other bytes than the signature file.
@@ -32,12 +34,12 @@ struct SignatureBlock {
 
   // The signer's certificate as the block holds it, unless `certificates` is set.
   Certificate SignerCertificate() const;
-  // The block over the signature file's bytes.
+  // The signer's SignerInfo over the signature file's bytes, and the block.
+  Bytes SignerInfo(const Bytes& signature_file) const;
   Bytes Build(const Bytes& signature_file) const;
 
  private:
   Bytes SignedData(const Bytes& signature_file) const;
-  Bytes SignerInfo(const Bytes& signature_file) const;
 };
 
 // The block over the signature file as somebody makes it who knows no more of the RSA test key

@@ -1,95 +1,100 @@
 // What a hostile file can reach by rules that are lenient or trusting on purpose, and where that
 // ends. docs/threat-model.md says why each is as it is.
-#include <fcntl.h>
-#include <gtest/gtest.h>
-#include <sys/stat.h>
-#include <unistd.h>
+#include <sys/wait.h>
 
-#include <algorithm>
 #include <cerrno>
-#include <functional>
+#include <csignal>
+#include <map>
 
-#include "apk/apk.h"
-#include "sign/registration.h"
-#include "sign/signing.h"
 #include "support/compiled_manifest.h"
-#include "support/files.h"
-#include "support/log_capture.h"
-#include "support/package.h"
-#include "support/phone.h"
 #include "support/process.h"
 #include "support/signature_block.h"
+#include "threats/device.h"
 
 namespace {
 
-using Strings = std::vector<std::string>;
+// ---- Whose package it is.
 
-const Bytes kLibrary = ToBytes("\177ELF foo");
+// The certificate of the key; they are told apart by their serial numbers.
+Certificate CertificateOf(const std::string& key, uint64_t serial) {
+  Certificate certificate;
+  certificate.key = key;
+  certificate.serial = der::Integer(serial);
+  return certificate;
+}
 
-// The whole tool over a file, on a healthy phone.
-class Device {
- public:
-  explicit Device(const Bytes& archive) : path_(temp_.Write("app/base.apk", archive)) {}
-  explicit Device(const Package& package) : Device(package.Build()) {}
-
-  // Puts the bytes on disk, at a path from the package's folder on.
-  Device& Install(const std::string& path, const Bytes& content) {
-    temp_.Write("app/" + path, content);
-    return *this;
+// A package whose block has the certificates of two keys, and the SignerInfos of two, each in this
+// order.
+Package WithTwoSigners(const Strings& certificates, const Strings& signers) {
+  Package package = MakePackage();
+  const Bytes signature_file = package.Item("META-INF/CERT.SF").data;
+  SignatureBlock block;
+  block.certificates = Bytes();
+  Bytes infos;
+  for (const std::string& key : certificates) {
+    const Bytes certificate = CertificateOf(key, key == "rsa-2048" ? 1 : 2).Build();
+    block.certificates->insert(block.certificates->end(), certificate.begin(), certificate.end());
   }
-  // The same path, of the file system.
-  std::string Path(const std::string& path) const { return temp_ / ("app/" + path); }
-
-  // The names, from the folder above the package's on, of the files that were signed with the key
-  // of `signer`, in their order.
-  Strings FilesSignedFor(const std::string& signer) {
-    const std::string payload = "2000" + Hex(DigestOf(Digest::kSha256, ModulusOf(signer)));
-    return FilesSignedWith(payload);
+  for (const std::string& key : signers) {
+    SignatureBlock signer;
+    signer.key = key;
+    signer.serial = der::Integer(uint64_t{key == "rsa-2048" ? 1U : 2U});
+    const Bytes info = signer.SignerInfo(signature_file);
+    infos.insert(infos.end(), info.begin(), info.end());
   }
+  block.signer_infos = der::Element(der::kSet, infos);
+  package.Item("META-INF/CERT.RSA").data = block.Build(signature_file);
+  return package;
+}
 
-  // Of all that begin so, in hexadecimal digits.
-  Strings FilesSignedWith(const std::string& payload) {
-    Strings files;
-    phone.witness = [&](int fd, const std::string& event) {
-      const std::string sign = "sign " + std::to_string(fd) + " ";
-      if (event.rfind(sign + payload, 0) != 0) return;
-      char path[4096] = {};
-      const std::string link = "/proc/self/fd/" + std::to_string(fd);
-      if (readlink(link.c_str(), path, sizeof(path) - 1) < 0) return;
-      files.push_back(std::string(path).substr(temp_.path().size() + 1));
-    };
-    RunSteps();
-    return files;
-  }
+bool IsVerifiedByOpenssl(Package package) {
+  const TempDir folder;
+  folder.Write("block", package.Item("META-INF/CERT.RSA").data);
+  folder.Write("file", package.Item("META-INF/CERT.SF").data);
+  return RunProcess({"openssl", "cms", "-verify", "-noverify", "-binary", "-inform", "DER", "-in",
+                     folder / "block", "-content", folder / "file", "-out", "/dev/null"})
+             .status == 0;
+}
 
-  // What libzu was asked to register: name and data.
-  Strings Registered() {
-    RunSteps();
-    Strings registered;
-    for (const std::string& event : phone.events) {
-      if (event.rfind("register ", 0) != 0) continue;
-      registered.push_back(event.substr(event.find(' ', 9) + 1));
+TEST(Threat, OfTwoSignersTheFirstCertificateAndTheFirstSignatureCount) {
+  const Strings one = {"rsa-2048", "rsa-2048-other"}, other = {"rsa-2048-other", "rsa-2048"};
+  for (const Strings& certificates : {one, other}) {
+    for (const Strings& signers : {one, other}) {
+      const Package package = WithTwoSigners(certificates, signers);
+      // Another reader looks for the certificate that goes with each signature.
+      EXPECT_TRUE(IsVerifiedByOpenssl(package));
+      const bool is_pair = certificates[0] == signers[0];
+      EXPECT_EQ(Device(package).FilesSignedFor(certificates[0]),
+                is_pair ? Strings({"app/base.apk"}) : Strings());
+      EXPECT_EQ(Device(package).FilesSignedFor(certificates[1]), Strings());
     }
-    return registered;
   }
+}
 
-  LogCapture log;
-  Phone phone;
+// The modulus has four bytes behind it, and the exponent's fifth to eighth byte make its length
+// what it was: 256, 00 01 00 00 in the order of the host. Another reader sees a key of 2080 bits.
+TEST(Threat, AModulusWithJunkBehindItIsTheKeyThatItStartsWith) {
+  Package package = MakePackage();
+  Certificate certificate;
+  certificate.public_key_info = PublicKeyInfoAround(
+      der::Sequence({der::Integer(Concat({{0}, ModulusOf("rsa-2048"), {1, 2, 3, 4}})),
+                     der::Integer(FromHex("01 00 01 00 00 01 00 00"))}));
+  SignatureBlock block;
+  block.certificates = certificate.Build();
+  package.Item("META-INF/CERT.RSA").data = block.Build(package.Item("META-INF/CERT.SF").data);
+  EXPECT_EQ(Device(package).FilesSignedFor("rsa-2048"), Strings({"app/base.apk"}));
+}
 
- private:
-  void RunSteps() {
-    const int fd = open(path_.c_str(), O_RDONLY);
-    ASSERT_GE(fd, 0);
-    ApkTools::Apk apk(fd);
-    VeltSignJni(apk, fd, path_.c_str());
-    VeltSign(apk, fd, fd);
-    ZuSign(apk, fd, fd);
-    close(fd);
-  }
+// Nothing in what is verified says that there is a newer one.
+TEST(Threat, AnOlderPackageOfASignerKeepsItsPayload) {
+  const Package older = MakePackage();
+  PackageOptions options;
+  options.entries = {{"classes.dex", ToBytes("dex\n035 mended")}};
+  EXPECT_EQ(Device(MakePackage(options)).FilesSignedFor("rsa-2048"), Strings({"app/base.apk"}));
+  EXPECT_EQ(Device(older).FilesSignedFor("rsa-2048"), Strings({"app/base.apk"}));
+}
 
-  TempDir temp_;
-  const std::string path_;
-};
+// ---- Names.
 
 PackageOptions WithLibrariesNamed(const Strings& names) {
   PackageOptions options;
@@ -97,161 +102,6 @@ PackageOptions WithLibrariesNamed(const Strings& names) {
   for (const std::string& name : names) options.entries.push_back({name, kLibrary});
   return options;
 }
-
-// What aapt and apksigner made.
-Bytes Made(const std::string& name) {
-  return ToBytes(ContentOf(THREAT_PACKAGES "/" + name + "/base.apk"));
-}
-
-// ---- An exponent of 1: anyone can write down signatures for any key.
-
-// The made package of the victim, its signature block exchanged for a forged one.
-Bytes WithForgedBlock(const Bytes& exponent) {
-  const TempDir folder;
-  const std::string apk = folder.Write("base.apk", Made("victim"));
-  const std::string entry = "META-INF/CERT.SF";
-  EXPECT_EQ(RunProcess({"unzip", "-q", apk, entry, "-d", folder.path()}).status, 0);
-  const Bytes signature_file = ToBytes(ContentOf(folder / entry));
-  folder.Write("META-INF/CERT.RSA", ForgedBlock(signature_file, "rsa-2048", exponent));
-  EXPECT_EQ(RunProcess({"aapt", "remove", apk, "META-INF/CERT.RSA"}).status, 0);
-  EXPECT_EQ(RunProcess({"aapt", "add", apk, "META-INF/CERT.RSA"}, folder.path()).status, 0);
-  return ToBytes(ContentOf(apk));
-}
-
-// However 1 and -1 are written so that the record reads them: with any tail that leaves the length
-// of the modulus as it is, which is 256, 00 01 00 00 in the order of the host.
-TEST(Threat, AnExponentOfOneIsRefusedHoweverItIsWritten) {
-  for (const char* exponent :
-       {"01", "01 00", "01 00 00", "01 00 00 00", "FF FF FF FF", "01 00 00 00 00 01",
-        "01 00 00 00 00 01 00", "01 00 00 00 00 01 00 00", "01 00 00 00 00 01 00 00 AA BB",
-        "01 00 00 00 00", "FF FF FF FF 00 01", "FF FF FF FF 00 01 00 00"}) {
-    Device device(WithForgedBlock(FromHex(exponent)));
-    EXPECT_EQ(device.FilesSignedWith(""), Strings()) << exponent;
-    EXPECT_EQ(device.log.records()[0], Error("RSA could not set key: 5\n")) << exponent;
-    EXPECT_EQ(device.log.records()[1], Error("file not verified: META-INF/CERT.SF\n")) << exponent;
-  }
-}
-
-// They reach the signature's check, and fail there.
-TEST(Threat, AnyOtherExponentAsksForThePrivateKey) {
-  for (const char* exponent : {"00", "02", "03", "11", "7F", "01 00 01", "01 01", "00 01", "02 00",
-                               "FE FF FF FF", "FF FF FF 7F", "FF FF FF", "FF", "00 00 00 01"}) {
-    Device device(WithForgedBlock(FromHex(exponent)));
-    EXPECT_EQ(device.FilesSignedWith(""), Strings()) << exponent;
-    EXPECT_EQ(device.log.records()[0].text.rfind("RSA could not verify certificate: ", 0), 0u)
-        << exponent << ": " << device.log.records()[0];
-  }
-}
-
-// ---- The file that is signed is the file that was read.
-
-class ExchangedLibrary : public testing::Test {
- protected:
-  ExchangedLibrary() : device_(Made("dots")), target_(device_.Path("../mine/libx.so")) {
-    device_.Install("lib/arm64/x", {}).Install("../mine/libx.so", kMine);
-    device_.Install("../system/program", ToBytes("\177ELF system"));
-  }
-
-  // What is signed when `exchange` is made between the check and the signing: the package, and the
-  // library or not.
-  Strings FilesSigned(const std::function<void()>& exchange) {
-    device_.phone.before_open = [=](const char* path, int) {
-      seen_ += std::string(path).find("/mine/libx.so") != std::string::npos;
-      if (seen_ != 2) return;
-      exchange();
-      device_.phone.before_open = nullptr;
-    };
-    const Strings files = device_.FilesSignedFor("rsa-2048-other");
-    EXPECT_EQ(seen_, 2) << "the library was not opened a second time";
-    return files;
-  }
-  void ExpectRefused(const std::function<void()>& exchange) {
-    alarm(60);  // whoever waits for a FIFO is ended
-    EXPECT_EQ(FilesSigned(exchange), Strings({"app/base.apk"}));
-    alarm(0);
-    const std::string path = device_.Path("lib/arm64/../../../mine/libx.so");
-    const Records& records = device_.log.records();
-    EXPECT_EQ(std::count(records.begin(), records.end(),
-                         Error("VeltSignJni: File not verified: " + path + "\n")),
-              1);
-  }
-  void Remove() { EXPECT_EQ(unlink(target_.c_str()), 0); }
-
-  static constexpr char kMineText[] = "\177ELF mine";
-  const Bytes kMine = ToBytes(kMineText);
-  Device device_;
-  const std::string target_;
-  int seen_ = 0;
-};
-
-TEST_F(ExchangedLibrary, ThatStaysAsItWasIsSigned) {
-  EXPECT_EQ(FilesSigned([] {}), Strings({"mine/libx.so", "app/base.apk"}));
-}
-
-TEST_F(ExchangedLibrary, ForASymbolicLinkToAnotherFileIsRefused) {
-  ExpectRefused([this] {
-    Remove();
-    EXPECT_EQ(symlink(device_.Path("../system/program").c_str(), target_.c_str()), 0);
-  });
-}
-
-TEST_F(ExchangedLibrary, ForAFifoIsRefusedWithoutWaiting) {
-  ExpectRefused([this] {
-    Remove();
-    EXPECT_EQ(mkfifo(target_.c_str(), 0600), 0);
-  });
-}
-
-TEST_F(ExchangedLibrary, ForAFolderIsRefused) {
-  ExpectRefused([this] {
-    Remove();
-    EXPECT_EQ(mkdir(target_.c_str(), 0700), 0);
-  });
-}
-
-TEST_F(ExchangedLibrary, ForAnotherFileWithTheSameBytesIsRefused) {
-  ExpectRefused([this] {
-    device_.Install("../mine/other", kMine);
-    EXPECT_EQ(rename(device_.Path("../mine/other").c_str(), target_.c_str()), 0);
-  });
-}
-
-TEST_F(ExchangedLibrary, WrittenToIsRefused) {
-  ExpectRefused([this] {
-    usleep(20000);  // the clock of file systems is coarse
-    WriteFile(target_, ToBytes("\177ELF evil"));
-  });
-}
-
-// Times can be set, but not the one of the last change of state.
-TEST_F(ExchangedLibrary, WrittenToWithItsTimeSetBackIsRefused) {
-  ExpectRefused([this] {
-    struct stat before;
-    EXPECT_EQ(stat(target_.c_str(), &before), 0);
-    usleep(20000);
-    WriteFile(target_, ToBytes("\177ELF evil"));
-    const timespec times[] = {before.st_atim, before.st_mtim};
-    EXPECT_EQ(utimensat(AT_FDCWD, target_.c_str(), times, 0), 0);
-  });
-}
-
-TEST_F(ExchangedLibrary, LongerIsRefused) {
-  ExpectRefused([this] { WriteFile(target_, ToBytes("\177ELF mine and more")); });
-}
-
-TEST_F(ExchangedLibrary, LeavesNoDescriptorBehind) {
-  const int next = dup(0);
-  close(next);
-  ExpectRefused([this] {
-    Remove();
-    EXPECT_EQ(mkfifo(target_.c_str(), 0600), 0);
-  });
-  const int now = dup(0);
-  close(now);
-  EXPECT_EQ(now, next);
-}
-
-// ---- What is left.
 
 TEST(Threat, DotsInAnEntryNameReachAFileOutsideWhoseBytesTheManifestLists) {
   Device device(MakePackage(WithLibrariesNamed({"lib/arm64-v8a/../../../other/libfoo.so"})));
@@ -295,6 +145,83 @@ TEST(Threat, PackageWhoseAndroidManifestCannotBeExtractedIsAJarThatTheKernelMust
   Device other(package);
   other.phone.verify_errno = ENOKEY;
   EXPECT_EQ(other.FilesSignedWith("0000"), Strings());
+}
+
+// ---- What is written to while it is worked on.
+
+// The files that are signed, and the bytes that they have then.
+std::map<std::string, std::string> BytesSigned(Device& device) {
+  std::map<std::string, std::string> signed_bytes;
+  device.phone.witness = [&](int fd, const std::string& event) {
+    if (event.rfind("sign ", 0) != 0) return;
+    char path[4096] = {};
+    const std::string link = "/proc/self/fd/" + std::to_string(fd);
+    ASSERT_GT(readlink(link.c_str(), path, sizeof(path) - 1), 0);
+    signed_bytes[path] = ContentOf(path);
+  };
+  device.RunSteps();
+  return signed_bytes;
+}
+
+// Writes a byte into the file, in place.
+void Patch(const std::string& path, size_t position, char byte) {
+  const int fd = open(path.c_str(), O_WRONLY);
+  ASSERT_EQ(pwrite(fd, &byte, 1, static_cast<off_t>(position)), 1);
+  close(fd);
+}
+
+TEST(Threat, ALibraryThatIsWrittenToInPlaceAfterItsChecksIsSigned) {
+  Device device(MakePackage());
+  device.Install("lib/arm64/libfoo.so", kLibrary);
+  const std::string library = device.Path("lib/arm64/libfoo.so");
+  device.phone.before_integrity = [&] { Patch(library, 5, 'F'); };
+  EXPECT_EQ(BytesSigned(device)[library], "\177ELF Foo");
+}
+
+TEST(Threat, APackageThatIsWrittenToInPlaceAfterItsChecksIsSigned) {
+  PackageOptions options;
+  options.entries.push_back({"assets/text", ToBytes("an asset")});
+  const Bytes archive = MakePackage(options).Build();
+  Device device(archive);
+  const std::string package = device.Path("base.apk");
+  const std::string text(archive.begin(), archive.end());
+  const size_t asset = text.find("an asset");
+  device.phone.before_integrity = [&] { Patch(package, asset, 'A'); };
+  std::string expected = text;
+  expected[asset] = 'A';
+  EXPECT_EQ(BytesSigned(device)[package], expected);
+}
+
+// Between the kernel's word that it trusts the file and its being signed.
+TEST(Threat, AJarThatIsWrittenToInPlaceAfterItWasTrustedIsSigned) {
+  const Bytes archive = MakePackage(PlainJar()).Build();
+  Device device(archive);
+  const std::string jar = device.Path("base.apk");
+  device.phone.before_integrity = [&] { Patch(jar, 0, 'p'); };
+  EXPECT_EQ(BytesSigned(device)[jar][0], 'p');
+}
+
+// The zip library has the directory of the archive mapped. What had been signed before stays so.
+TEST(Threat, AFileThatShrinksMeanwhileEndsTheProcess) {
+  PackageOptions options = WithLibrariesNamed({"lib/arm64-v8a/libfoo.so"});
+  for (int i = 0; i < 1000; ++i) options.entries.push_back({"assets/" + std::to_string(i), {}});
+  const Bytes archive = MakePackage(options).Build();
+  const pid_t child = fork();
+  if (child == 0) {
+    signal(SIGBUS, SIG_DFL);
+    Device device(archive);
+    device.Install("lib/arm64/libfoo.so", kLibrary);
+    device.phone.before_open = [&](const char* path, int) {
+      if (std::string(path).find("libfoo.so") == std::string::npos) return;
+      if (truncate(device.Path("base.apk").c_str(), 0) != 0) _exit(1);
+    };
+    device.RunSteps();
+    _exit(0);
+  }
+  int status = 0;
+  ASSERT_EQ(waitpid(child, &status, 0), child);
+  EXPECT_TRUE(WIFSIGNALED(status));
+  EXPECT_EQ(WTERMSIG(status), SIGBUS);
 }
 
 }  // namespace

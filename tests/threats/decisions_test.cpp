@@ -1,0 +1,162 @@
+// The two refusals that no signing tool's package ever meets: an exponent of 1, and a library that is
+// no longer the file that was read. On packages that aapt and apksigner made.
+#include <sys/stat.h>
+
+#include <algorithm>
+#include <functional>
+
+#include "support/process.h"
+#include "support/signature_block.h"
+#include "threats/device.h"
+
+namespace {
+
+// ---- An exponent of 1: anyone can write down signatures for any key.
+
+// The made package of the victim, its signature block exchanged for a forged one.
+Bytes WithForgedBlock(const Bytes& exponent) {
+  const TempDir folder;
+  const std::string apk = folder.Write("base.apk", Made("victim"));
+  const std::string entry = "META-INF/CERT.SF";
+  EXPECT_EQ(RunProcess({"unzip", "-q", apk, entry, "-d", folder.path()}).status, 0);
+  const Bytes signature_file = ToBytes(ContentOf(folder / entry));
+  folder.Write("META-INF/CERT.RSA", ForgedBlock(signature_file, "rsa-2048", exponent));
+  EXPECT_EQ(RunProcess({"aapt", "remove", apk, "META-INF/CERT.RSA"}).status, 0);
+  EXPECT_EQ(RunProcess({"aapt", "add", apk, "META-INF/CERT.RSA"}, folder.path()).status, 0);
+  return ToBytes(ContentOf(apk));
+}
+
+// However 1 and -1 are written so that the record reads them: with any tail that leaves the length
+// of the modulus as it is, which is 256, 00 01 00 00 in the order of the host.
+TEST(Threat, AnExponentOfOneIsRefusedHoweverItIsWritten) {
+  for (const char* exponent :
+       {"01", "01 00", "01 00 00", "01 00 00 00", "FF FF FF FF", "01 00 00 00 00 01",
+        "01 00 00 00 00 01 00", "01 00 00 00 00 01 00 00", "01 00 00 00 00 01 00 00 AA BB",
+        "01 00 00 00 00", "FF FF FF FF 00 01", "FF FF FF FF 00 01 00 00"}) {
+    Device device(WithForgedBlock(FromHex(exponent)));
+    EXPECT_EQ(device.FilesSignedWith(""), Strings()) << exponent;
+    EXPECT_EQ(device.log.records()[0], Error("RSA could not set key: 5\n")) << exponent;
+    EXPECT_EQ(device.log.records()[1], Error("file not verified: META-INF/CERT.SF\n")) << exponent;
+  }
+}
+
+// They reach the signature's check, and fail there.
+TEST(Threat, AnyOtherExponentAsksForThePrivateKey) {
+  for (const char* exponent : {"00", "02", "03", "11", "7F", "01 00 01", "01 01", "00 01", "02 00",
+                               "FE FF FF FF", "FF FF FF 7F", "FF FF FF", "FF", "00 00 00 01"}) {
+    Device device(WithForgedBlock(FromHex(exponent)));
+    EXPECT_EQ(device.FilesSignedWith(""), Strings()) << exponent;
+    EXPECT_EQ(device.log.records()[0].text.rfind("RSA could not verify certificate: ", 0), 0u)
+        << exponent << ": " << device.log.records()[0];
+  }
+}
+
+// ---- The file that is signed is the file that was read.
+
+class ExchangedLibrary : public testing::Test {
+ protected:
+  ExchangedLibrary() : device_(Made("dots")), target_(device_.Path("../mine/libx.so")) {
+    device_.Install("lib/arm64/x", {}).Install("../mine/libx.so", kMine);
+    device_.Install("../system/program", ToBytes("\177ELF system"));
+  }
+
+  // What is signed when `exchange` is made between the check and the signing: the package, and the
+  // library or not.
+  Strings FilesSigned(const std::function<void()>& exchange) {
+    device_.phone.before_open = [=](const char* path, int) {
+      seen_ += std::string(path).find("/mine/libx.so") != std::string::npos;
+      if (seen_ != 2) return;
+      exchange();
+      device_.phone.before_open = nullptr;
+    };
+    const Strings files = device_.FilesSignedFor("rsa-2048-other");
+    EXPECT_EQ(seen_, 2) << "the library was not opened a second time";
+    return files;
+  }
+  void ExpectRefused(const std::function<void()>& exchange) {
+    alarm(60);  // whoever waits for a FIFO is ended
+    EXPECT_EQ(FilesSigned(exchange), Strings({"app/base.apk"}));
+    alarm(0);
+    const std::string path = device_.Path("lib/arm64/../../../mine/libx.so");
+    const Records& records = device_.log.records();
+    EXPECT_EQ(std::count(records.begin(), records.end(),
+                         Error("VeltSignJni: File not verified: " + path + "\n")),
+              1);
+  }
+  void Remove() { EXPECT_EQ(unlink(target_.c_str()), 0); }
+
+  static constexpr char kMineText[] = "\177ELF mine";
+  const Bytes kMine = ToBytes(kMineText);
+  Device device_;
+  const std::string target_;
+  int seen_ = 0;
+};
+
+TEST_F(ExchangedLibrary, ThatStaysAsItWasIsSigned) {
+  EXPECT_EQ(FilesSigned([] {}), Strings({"mine/libx.so", "app/base.apk"}));
+}
+
+TEST_F(ExchangedLibrary, ForASymbolicLinkToAnotherFileIsRefused) {
+  ExpectRefused([this] {
+    Remove();
+    EXPECT_EQ(symlink(device_.Path("../system/program").c_str(), target_.c_str()), 0);
+  });
+}
+
+TEST_F(ExchangedLibrary, ForAFifoIsRefusedWithoutWaiting) {
+  ExpectRefused([this] {
+    Remove();
+    EXPECT_EQ(mkfifo(target_.c_str(), 0600), 0);
+  });
+}
+
+TEST_F(ExchangedLibrary, ForAFolderIsRefused) {
+  ExpectRefused([this] {
+    Remove();
+    EXPECT_EQ(mkdir(target_.c_str(), 0700), 0);
+  });
+}
+
+TEST_F(ExchangedLibrary, ForAnotherFileWithTheSameBytesIsRefused) {
+  ExpectRefused([this] {
+    device_.Install("../mine/other", kMine);
+    EXPECT_EQ(rename(device_.Path("../mine/other").c_str(), target_.c_str()), 0);
+  });
+}
+
+TEST_F(ExchangedLibrary, WrittenToIsRefused) {
+  ExpectRefused([this] {
+    usleep(20000);  // the clock of file systems is coarse
+    WriteFile(target_, ToBytes("\177ELF evil"));
+  });
+}
+
+// Times can be set, but not the one of the last change of state.
+TEST_F(ExchangedLibrary, WrittenToWithItsTimeSetBackIsRefused) {
+  ExpectRefused([this] {
+    struct stat before;
+    EXPECT_EQ(stat(target_.c_str(), &before), 0);
+    usleep(20000);
+    WriteFile(target_, ToBytes("\177ELF evil"));
+    const timespec times[] = {before.st_atim, before.st_mtim};
+    EXPECT_EQ(utimensat(AT_FDCWD, target_.c_str(), times, 0), 0);
+  });
+}
+
+TEST_F(ExchangedLibrary, LongerIsRefused) {
+  ExpectRefused([this] { WriteFile(target_, ToBytes("\177ELF mine and more")); });
+}
+
+TEST_F(ExchangedLibrary, LeavesNoDescriptorBehind) {
+  const int next = dup(0);
+  close(next);
+  ExpectRefused([this] {
+    Remove();
+    EXPECT_EQ(mkfifo(target_.c_str(), 0600), 0);
+  });
+  const int now = dup(0);
+  close(now);
+  EXPECT_EQ(now, next);
+}
+
+}  // namespace

@@ -1,0 +1,91 @@
+// The whole tool over a file on disk, on a healthy phone inside the test program.
+#pragma once
+
+#include <fcntl.h>
+#include <gtest/gtest.h>
+#include <unistd.h>
+
+#include <string>
+#include <vector>
+
+#include "apk/apk.h"
+#include "sign/registration.h"
+#include "sign/signing.h"
+#include "support/certificate.h"
+#include "support/files.h"
+#include "support/log_capture.h"
+#include "support/package.h"
+#include "support/phone.h"
+
+using Strings = std::vector<std::string>;
+
+inline const Bytes kLibrary = ToBytes("\177ELF foo");
+
+// What aapt and apksigner made.
+inline Bytes Made(const std::string& name) {
+  return ToBytes(ContentOf(THREAT_PACKAGES "/" + name + "/base.apk"));
+}
+
+class Device {
+ public:
+  explicit Device(const Bytes& archive) : path_(temp_.Write("app/base.apk", archive)) {}
+  explicit Device(const Package& package) : Device(package.Build()) {}
+
+  // Puts the bytes on disk, at a path from the package's folder on.
+  Device& Install(const std::string& path, const Bytes& content) {
+    temp_.Write("app/" + path, content);
+    return *this;
+  }
+  // The same path, of the file system.
+  std::string Path(const std::string& path) const { return temp_ / ("app/" + path); }
+
+  // The names, from the folder above the package's on, of the files that were signed with the key
+  // of `signer`, in their order.
+  Strings FilesSignedFor(const std::string& signer) {
+    const std::string payload = "2000" + Hex(DigestOf(Digest::kSha256, ModulusOf(signer)));
+    return FilesSignedWith(payload);
+  }
+
+  // Of all that begin so, in hexadecimal digits.
+  Strings FilesSignedWith(const std::string& payload) {
+    Strings files;
+    phone.witness = [&](int fd, const std::string& event) {
+      const std::string sign = "sign " + std::to_string(fd) + " ";
+      if (event.rfind(sign + payload, 0) != 0) return;
+      char path[4096] = {};
+      const std::string link = "/proc/self/fd/" + std::to_string(fd);
+      if (readlink(link.c_str(), path, sizeof(path) - 1) < 0) return;
+      files.push_back(std::string(path).substr(temp_.path().size() + 1));
+    };
+    RunSteps();
+    return files;
+  }
+
+  // What libzu was asked to register: name and data.
+  Strings Registered() {
+    RunSteps();
+    Strings registered;
+    for (const std::string& event : phone.events) {
+      if (event.rfind("register ", 0) != 0) continue;
+      registered.push_back(event.substr(event.find(' ', 9) + 1));
+    }
+    return registered;
+  }
+
+  void RunSteps() {
+    const int fd = open(path_.c_str(), O_RDONLY);
+    ASSERT_GE(fd, 0);
+    ApkTools::Apk apk(fd);
+    VeltSignJni(apk, fd, path_.c_str());
+    VeltSign(apk, fd, fd);
+    ZuSign(apk, fd, fd);
+    close(fd);
+  }
+
+  LogCapture log;
+  Phone phone;
+
+ private:
+  TempDir temp_;
+  const std::string path_;
+};
