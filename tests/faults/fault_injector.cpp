@@ -24,6 +24,8 @@
 #include <cstdlib>
 #include <cstring>
 
+#include "simulator/phone/next_function.h"
+
 extern "C" {
 void* __libc_malloc(size_t size);
 void* __libc_calloc(size_t count, size_t size);
@@ -47,11 +49,11 @@ bool IsIn(const char* name, const void* address) {
 // containers abort. It is made to abort as well, so that no other crash can hide behind it.
 void AbortForString8(int, siginfo_t*, void* context) {
 #ifdef __x86_64__
-  const auto at = static_cast<ucontext_t*>(context)->uc_mcontext.gregs[REG_RIP];
+  const auto address = static_cast<ucontext_t*>(context)->uc_mcontext.gregs[REG_RIP];
 #else
-  const auto at = static_cast<ucontext_t*>(context)->uc_mcontext.pc;
+  const auto address = static_cast<ucontext_t*>(context)->uc_mcontext.pc;
 #endif
-  if (IsIn("/android/libutils.so", reinterpret_cast<void*>(at))) abort();
+  if (IsIn("/android/libutils.so", reinterpret_cast<void*>(address))) abort();
   signal(SIGSEGV, SIG_DFL);
 }
 
@@ -80,12 +82,6 @@ bool Fails(const char* name, int error, const void* caller = nullptr) {
   return true;
 }
 
-// What the program would call without this library.
-template <typename Function>
-Function* Meant(const char* name) {
-  return reinterpret_cast<Function*>(dlsym(RTLD_NEXT, name));
-}
-
 using Main = int(int, char**, char**);
 Main* real_main = nullptr;
 
@@ -101,7 +97,7 @@ using StartMain = int(Main*, int, char**, void (*)(), void (*)(), void (*)(), vo
 extern "C" int __libc_start_main(Main* program, int argc, char** argv, void (*init)(),
                                  void (*fini)(), void (*rtld_fini)(), void* stack_end) {
   real_main = program;
-  return Meant<StartMain>("__libc_start_main")(ArmAndStart, argc, argv, init, fini, rtld_fini,
+  return NextFunction<StartMain>("__libc_start_main")(ArmAndStart, argc, argv, init, fini, rtld_fini,
                                                stack_end);
 }
 
@@ -116,67 +112,67 @@ extern "C" void* realloc(void* block, size_t size) {
 }
 
 extern "C" ssize_t read(int fd, void* buffer, size_t size) {
-  static auto* const meant = Meant<ssize_t(int, void*, size_t)>("read");
-  return Fails("read", EIO, __builtin_return_address(0)) ? -1 : meant(fd, buffer, size);
+  static auto* const next = NextFunction<ssize_t(int, void*, size_t)>("read");
+  return Fails("read", EIO, __builtin_return_address(0)) ? -1 : next(fd, buffer, size);
 }
 extern "C" ssize_t readlink(const char* path, char* buffer, size_t size) {
-  static auto* const meant = Meant<ssize_t(const char*, char*, size_t)>("readlink");
-  return Fails("readlink", EIO, __builtin_return_address(0)) ? -1 : meant(path, buffer, size);
+  static auto* const next = NextFunction<ssize_t(const char*, char*, size_t)>("readlink");
+  return Fails("readlink", EIO, __builtin_return_address(0)) ? -1 : next(path, buffer, size);
 }
 extern "C" ssize_t fgetxattr(int fd, const char* name, void* value, size_t size) {
-  static auto* const meant = Meant<ssize_t(int, const char*, void*, size_t)>("fgetxattr");
-  return Fails("fgetxattr", EIO, __builtin_return_address(0)) ? -1 : meant(fd, name, value, size);
+  static auto* const next = NextFunction<ssize_t(int, const char*, void*, size_t)>("fgetxattr");
+  return Fails("fgetxattr", EIO, __builtin_return_address(0)) ? -1 : next(fd, name, value, size);
 }
 extern "C" int fstatvfs(int fd, struct statvfs* state) {
-  static auto* const meant = Meant<int(int, struct statvfs*)>("fstatvfs");
-  return Fails("fstatvfs", EIO, __builtin_return_address(0)) ? -1 : meant(fd, state);
+  static auto* const next = NextFunction<int(int, struct statvfs*)>("fstatvfs");
+  return Fails("fstatvfs", EIO, __builtin_return_address(0)) ? -1 : next(fd, state);
 }
 
 extern "C" int fstatvfs64(int fd, struct statvfs64* state) {
-  static auto* const meant = Meant<int(int, struct statvfs64*)>("fstatvfs64");
-  return Fails("fstatvfs", EIO, __builtin_return_address(0)) ? -1 : meant(fd, state);
+  static auto* const next = NextFunction<int(int, struct statvfs64*)>("fstatvfs64");
+  return Fails("fstatvfs", EIO, __builtin_return_address(0)) ? -1 : next(fd, state);
 }
 
 extern "C" FILE* fopen(const char* path, const char* mode) {
-  static auto* const meant = Meant<FILE*(const char*, const char*)>("fopen");
-  return Fails("fopen", EMFILE, __builtin_return_address(0)) ? nullptr : meant(path, mode);
+  static auto* const next = NextFunction<FILE*(const char*, const char*)>("fopen");
+  return Fails("fopen", EMFILE, __builtin_return_address(0)) ? nullptr : next(path, mode);
 }
 extern "C" FILE* fopen64(const char* path, const char* mode) {
-  static auto* const meant = Meant<FILE*(const char*, const char*)>("fopen64");
-  return Fails("fopen", EMFILE, __builtin_return_address(0)) ? nullptr : meant(path, mode);
+  static auto* const next = NextFunction<FILE*(const char*, const char*)>("fopen64");
+  return Fails("fopen", EMFILE, __builtin_return_address(0)) ? nullptr : next(path, mode);
 }
 
 // The mode is read even where none is given: it then is not looked at.
 extern "C" int open(const char* path, int flags, ...) {
-  static auto* const meant = Meant<int(const char*, int, ...)>("open");
+  static auto* const next = NextFunction<int(const char*, int, ...)>("open");
   va_list arguments;
   va_start(arguments, flags);
   const auto mode = va_arg(arguments, mode_t);
   va_end(arguments);
-  return Fails("open", EMFILE, __builtin_return_address(0)) ? -1 : meant(path, flags, mode);
+  return Fails("open", EMFILE, __builtin_return_address(0)) ? -1 : next(path, flags, mode);
 }
 extern "C" int open64(const char* path, int flags, ...) {
-  static auto* const meant = Meant<int(const char*, int, ...)>("open64");
+  static auto* const next = NextFunction<int(const char*, int, ...)>("open64");
   va_list arguments;
   va_start(arguments, flags);
   const auto mode = va_arg(arguments, mode_t);
   va_end(arguments);
-  return Fails("open", EMFILE, __builtin_return_address(0)) ? -1 : meant(path, flags, mode);
+  return Fails("open", EMFILE, __builtin_return_address(0)) ? -1 : next(path, flags, mode);
 }
 
 extern "C" int fcntl(int fd, int command, ...) {
-  static auto* const meant = Meant<int(int, int, ...)>("fcntl");
+  static auto* const next = NextFunction<int(int, int, ...)>("fcntl");
   va_list arguments;
   va_start(arguments, command);
   void* const argument = va_arg(arguments, void*);
   va_end(arguments);
-  return Fails("fcntl", EIO, __builtin_return_address(0)) ? -1 : meant(fd, command, argument);
+  return Fails("fcntl", EIO, __builtin_return_address(0)) ? -1 : next(fd, command, argument);
 }
 extern "C" int fcntl64(int fd, int command, ...) {
-  static auto* const meant = Meant<int(int, int, ...)>("fcntl64");
+  static auto* const next = NextFunction<int(int, int, ...)>("fcntl64");
   va_list arguments;
   va_start(arguments, command);
   void* const argument = va_arg(arguments, void*);
   va_end(arguments);
-  return Fails("fcntl", EIO, __builtin_return_address(0)) ? -1 : meant(fd, command, argument);
+  return Fails("fcntl", EIO, __builtin_return_address(0)) ? -1 : next(fd, command, argument);
 }
