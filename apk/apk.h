@@ -94,10 +94,10 @@ class Apk {
   // records for the name. A mismatch, and an entry that cannot be extracted, are not logged.
   bool VerifyEntryHash(const std::string& name, ZipEntry& entry);
   // Whether the file at `path` has the digest that the manifest records for the entry `name`. A
-  // mismatch is not logged. `identity`, unless it is null, tells which file was read; it stays as
-  // it is when none was.
+  // mismatch is not logged. `state`, unless it is null, tells which file was read (ReadFile); it
+  // stays as it is when none was.
   bool VerifyFileHash(const std::string& name, const std::string& path,
-                      FileIdentity* identity = nullptr);
+                      struct stat* state = nullptr);
   // Whether `name` is one of the signature's own files, which no manifest lists.
   bool CanSkipValidation(const std::string& name);
 

@@ -35,9 +35,9 @@ bool Apk::VerifyEntryHash(const std::string& name, ZipEntry& entry) {
                        [&] { return ExtractZipEntry(zip_handle_, &entry, content) == 0; });
 }
 
-bool Apk::VerifyFileHash(const std::string& name, const std::string& path, FileIdentity* identity) {
+bool Apk::VerifyFileHash(const std::string& name, const std::string& path, struct stat* state) {
   std::vector<uint8_t> content;
-  return VerifyContent(name, content, [&] { return ReadFile(path, content, identity); });
+  return VerifyContent(name, content, [&] { return ReadFile(path, content, state); });
 }
 
 // `read_content` fills `content`, and answers whether it could; it is not called for a name that

@@ -143,7 +143,7 @@ std::string InstalledLibraryPath(const std::string& package_path, const std::str
 }
 
 void SignLibrary(ApkTools::Apk& apk, const std::string& entry_name, const std::string& target) {
-  FileIdentity verified = {};
+  struct stat verified = {};
   if (!apk.VerifyFileHash(entry_name, target, &verified)) return ReportNotVerified(target);
 
   // Without waiting, should `target` be a FIFO by now.
@@ -157,10 +157,9 @@ void SignLibrary(ApkTools::Apk& apk, const std::string& entry_name, const std::s
   }
   // Deliberate: signed is only the very file whose bytes were verified, unchanged since. An entry's
   // name may lead into a folder that others write to (docs/decisions/the-file-that-was-read.md).
-  FileIdentity opened;
-  if (!IdentifyFile(library.get(), &opened) || !(opened == verified)) {
-    return ReportNotVerified(target);
-  }
+  struct stat opened = {};
+  fstat(library.get(), &opened);
+  if (!IsSameFile(verified, opened)) return ReportNotVerified(target);
   VeltSignOat(apk, library.get());
 }
 

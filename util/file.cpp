@@ -14,33 +14,27 @@ namespace {
 
 constexpr ssize_t kUnknownSize = -1;
 
-ssize_t FindSize(int fd, FileIdentity* identity);
+ssize_t FindSize(int fd, struct stat* state);
 void ReadBytes(int fd, std::vector<uint8_t>& out);
 
 }  // namespace
 
-bool IdentifyFile(int fd, FileIdentity* identity) {
-  struct stat status;
-  if (fstat(fd, &status) != 0 || !S_ISREG(status.st_mode)) return false;
-  *identity = {status.st_dev, status.st_ino, status.st_size, status.st_mtim, status.st_ctim};
-  return true;
-}
-
-bool operator==(const FileIdentity& a, const FileIdentity& b) {
-  const auto same = [](const timespec& s, const timespec& t) {
-    return s.tv_sec == t.tv_sec && s.tv_nsec == t.tv_nsec;
+bool IsSameFile(const struct stat& before, const struct stat& after) {
+  const auto same = [](const timespec& a, const timespec& b) {
+    return a.tv_sec == b.tv_sec && a.tv_nsec == b.tv_nsec;
   };
-  return a.device == b.device && a.inode == b.inode && a.size == b.size &&
-         same(a.modified, b.modified) && same(a.changed, b.changed);
+  return S_ISREG(before.st_mode) && S_ISREG(after.st_mode) && before.st_dev == after.st_dev &&
+         before.st_ino == after.st_ino && before.st_size == after.st_size &&
+         same(before.st_mtim, after.st_mtim) && same(before.st_ctim, after.st_ctim);
 }
 
-bool ReadFile(const std::string& path, std::vector<uint8_t>& out, FileIdentity* identity) {
+bool ReadFile(const std::string& path, std::vector<uint8_t>& out, struct stat* state) {
   const ScopedFd fd(open(path.c_str(), O_RDONLY | O_NONBLOCK | O_CLOEXEC));
   if (fd.get() < 0) {
     LogError("Can't open file: %s\n", path.c_str());
     return false;
   }
-  FileIdentity found;
+  struct stat found;
   const ssize_t size = FindSize(fd.get(), &found);
   if (size < 0) {
     LogError("Can't read file: %s (streamoff=%zd)\n", path.c_str(), size);
@@ -51,7 +45,7 @@ bool ReadFile(const std::string& path, std::vector<uint8_t>& out, FileIdentity* 
   // Deliberate: a file that shrinks meanwhile is no failure. It leaves the end of `out` as it is,
   // whose digest, which every caller takes, then is not the expected one.
   ReadBytes(fd.get(), out);
-  if (identity != nullptr) *identity = found;
+  if (state != nullptr) *state = found;
   return true;
 }
 
@@ -66,10 +60,10 @@ std::vector<uint8_t> StringToVector(const std::string& s) { return {s.begin(), s
 
 namespace {
 
-// The size in bytes of the regular file `fd`, whose position is then its start again; its identity
-// as it was before.
-ssize_t FindSize(int fd, FileIdentity* identity) {
-  if (!IdentifyFile(fd, identity)) return kUnknownSize;
+// The size in bytes of the regular file `fd`, whose position is then its start again, and its state
+// before.
+ssize_t FindSize(int fd, struct stat* state) {
+  if (fstat(fd, state) != 0 || !S_ISREG(state->st_mode)) return kUnknownSize;
   const off_t size = lseek(fd, 0, SEEK_END);
   if (size < 0 || !FitsInMemory(static_cast<size_t>(size))) return kUnknownSize;
   return lseek(fd, 0, SEEK_SET) == 0 ? size : kUnknownSize;

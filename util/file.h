@@ -2,36 +2,26 @@
 // between calls; what is returned or filled belongs to the caller. ReadFile alone logs.
 #pragma once
 
-#include <sys/types.h>
+#include <sys/stat.h>
 
 #include <cstdint>
-#include <ctime>
 #include <string>
 #include <vector>
 
-// What tells one regular file from another, and from itself after a change: the kernel's numbers
-// for it, its size in bytes, and when its bytes and its state were last changed.
-struct FileIdentity {
-  dev_t device;
-  ino_t inode;
-  off_t size;
-  timespec modified;
-  timespec changed;
-};
-bool operator==(const FileIdentity& a, const FileIdentity& b);
-
-// The identity of the open file `fd`. False, with nothing told, when it is no regular file.
-bool IdentifyFile(int fd, FileIdentity* identity);
+// Whether two states of regular files, as fstat tells them, are of one file that was not changed
+// between them: as far as its size and the times of the last change of its bytes and of its state
+// say.
+bool IsSameFile(const struct stat& before, const struct stat& after);
 
 // Reads the regular file at `path` into `out`, which then has exactly the file's size in bytes, and
-// tells in `identity`, unless it is null, which file that was, before a byte of it was read. Never
-// waits and never aborts, whatever `path` names. False, with both untouched, when the file
+// tells in `state`, unless it is null, what fstat said of it before a byte was read. Never waits
+// and never aborts, whatever `path` names. False, with both untouched, when the file
 //   - cannot be opened: "Can't open file: %s\n", or
 //   - has no size that can be found, is not a regular file, or is larger than can be had in memory:
 //     "Can't read file: %s (streamoff=%zd)\n" with -1 for the size.
 // A file that gives fewer bytes than its size is still true; the rest of `out` is what growing it
 // made it: zeros where it was shorter before, what it held where it was not.
-bool ReadFile(const std::string& path, std::vector<uint8_t>& out, FileIdentity* identity = nullptr);
+bool ReadFile(const std::string& path, std::vector<uint8_t>& out, struct stat* state = nullptr);
 
 // The path of the file that `fd` is open on, as the kernel tells it, cut to its first 4095 bytes;
 // empty when `fd` is not open or the kernel has no path to tell.

@@ -97,8 +97,8 @@ using StartMain = int(Main*, int, char**, void (*)(), void (*)(), void (*)(), vo
 extern "C" int __libc_start_main(Main* program, int argc, char** argv, void (*init)(),
                                  void (*fini)(), void (*rtld_fini)(), void* stack_end) {
   real_main = program;
-  return NextFunction<StartMain>("__libc_start_main")(ArmAndStart, argc, argv, init, fini, rtld_fini,
-                                               stack_end);
+  return NextFunction<StartMain>("__libc_start_main")(ArmAndStart, argc, argv, init, fini,
+                                                      rtld_fini, stack_end);
 }
 
 extern "C" void* malloc(size_t size) {

@@ -1,5 +1,5 @@
-// The two refusals that no signing tool's package ever meets: an exponent of 1, and a library that is
-// no longer the file that was read. On packages that aapt and apksigner made.
+// The two refusals that no signing tool's package ever meets: an exponent of 1, and a library that
+// is no longer the file that was read. On packages that aapt and apksigner made.
 #include <sys/stat.h>
 
 #include <algorithm>

@@ -338,9 +338,9 @@ class DeepDirectory {
 
 // ---- Which file it is.
 
-TEST_F(ReadFileTest, TellsWhichFileItWasBeforeAByteWasRead) {
+TEST_F(ReadFileTest, TellsTheFilesStateBeforeAByteWasRead) {
   const std::string path = MakeFile("abc");
-  struct stat before;
+  struct stat before, after, read;
   ASSERT_EQ(stat(path.c_str(), &before), 0);
   kernel.read = [&](int fd, void* buffer, size_t size) {
     usleep(20000);  // the clock of file systems is coarse
@@ -348,45 +348,50 @@ TEST_F(ReadFileTest, TellsWhichFileItWasBeforeAByteWasRead) {
     return __real_read(fd, buffer, size);
   };
   Bytes out;
-  FileIdentity identity;
-  ASSERT_TRUE(ReadFile(path, out, &identity));
-  EXPECT_TRUE(identity ==
-              (FileIdentity{before.st_dev, before.st_ino, 3, before.st_mtim, before.st_ctim}));
-  struct stat after;
+  ASSERT_TRUE(ReadFile(path, out, &read));
   ASSERT_EQ(stat(path.c_str(), &after), 0);
-  EXPECT_FALSE(identity == (FileIdentity{after.st_dev, after.st_ino, after.st_size, after.st_mtim,
-                                         after.st_ctim}));
+  EXPECT_TRUE(IsSameFile(before, read));
+  EXPECT_FALSE(IsSameFile(after, read));
 }
 
-TEST_F(ReadFileTest, LeavesTheIdentityAloneWhenItFails) {
+TEST_F(ReadFileTest, LeavesTheStateAloneWhenItFails) {
   LogCapture log;
   Bytes out;
-  FileIdentity identity = {1, 2, 3, {4, 5}, {6, 7}};
-  EXPECT_FALSE(ReadFile(folder_.path(), out, &identity));
-  EXPECT_TRUE(identity == (FileIdentity{1, 2, 3, {4, 5}, {6, 7}}));
+  struct stat read = {};
+  read.st_ino = 7;
+  EXPECT_FALSE(ReadFile(folder_.path(), out, &read));
+  EXPECT_FALSE(ReadFile("/nowhere/file", out, &read));
+  EXPECT_EQ(read.st_ino, 7u);
 }
 
-TEST(FileIdentityTest, EachOfItsPartsCounts) {
-  const FileIdentity whole = {1, 2, 3, {4, 5}, {6, 7}};
-  EXPECT_TRUE(whole == (FileIdentity{1, 2, 3, {4, 5}, {6, 7}}));
-  const FileIdentity others[] = {{9, 2, 3, {4, 5}, {6, 7}}, {1, 9, 3, {4, 5}, {6, 7}},
-                                 {1, 2, 9, {4, 5}, {6, 7}}, {1, 2, 3, {9, 5}, {6, 7}},
-                                 {1, 2, 3, {4, 9}, {6, 7}}, {1, 2, 3, {4, 5}, {9, 7}},
-                                 {1, 2, 3, {4, 5}, {6, 9}}};
-  for (const FileIdentity& other : others) EXPECT_FALSE(whole == other) << &other - others;
+TEST(IsSameFile, EachPartOfTheStateCounts) {
+  struct stat state = {};
+  state.st_mode = S_IFREG | 0600;
+  state.st_dev = 1;
+  state.st_ino = 2;
+  state.st_size = 3;
+  state.st_mtim = {4, 5};
+  state.st_ctim = {6, 7};
+  EXPECT_TRUE(IsSameFile(state, state));
+  const std::vector<std::function<void(struct stat&)>> changes = {
+      [](struct stat& s) { s.st_dev = 9; },          [](struct stat& s) { s.st_ino = 9; },
+      [](struct stat& s) { s.st_size = 9; },         [](struct stat& s) { s.st_mtim.tv_sec = 9; },
+      [](struct stat& s) { s.st_mtim.tv_nsec = 9; }, [](struct stat& s) { s.st_ctim.tv_sec = 9; },
+      [](struct stat& s) { s.st_ctim.tv_nsec = 9; }, [](struct stat& s) { s.st_mode = S_IFIFO; }};
+  for (size_t i = 0; i < changes.size(); ++i) {
+    struct stat other = state;
+    changes[i](other);
+    EXPECT_FALSE(IsSameFile(state, other)) << i;
+    EXPECT_FALSE(IsSameFile(other, state)) << i;
+  }
 }
 
-TEST_F(FileTest, OnlyARegularFileHasAnIdentity) {
-  const int folder = open(folder_.path().c_str(), O_RDONLY);
-  const int file = open(MakeFile("abc").c_str(), O_RDONLY);
-  FileIdentity identity = {};
-  EXPECT_FALSE(IdentifyFile(folder, &identity));
-  EXPECT_FALSE(IdentifyFile(-1, &identity));
-  EXPECT_TRUE(identity == FileIdentity());
-  EXPECT_TRUE(IdentifyFile(file, &identity));
-  EXPECT_EQ(identity.size, 3);
-  close(folder);
-  close(file);
+// Neither is a regular file, alike as they may be.
+TEST(IsSameFile, WhatIsNoRegularFileIsNone) {
+  struct stat state = {};
+  EXPECT_FALSE(IsSameFile(state, state));
+  state.st_mode = S_IFDIR | 0700;
+  EXPECT_FALSE(IsSameFile(state, state));
 }
 
 TEST_F(GetFilenameByFdTest, TargetPathOf4094BytesIsWhole) {
