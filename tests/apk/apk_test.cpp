@@ -149,20 +149,65 @@ TEST(ApkInit, APathThatCannotBeOpenedIsReported) {
   EXPECT_EQ(StateOf(apk), (State{false, false, false, false}));
 }
 
+// Gives the process's standard stream of this number away while it lives.
+class FreeDescriptor {
+ public:
+  explicit FreeDescriptor(int fd) : fd_(fd), kept_(dup(fd)) { close(fd); }
+  ~FreeDescriptor() {
+    dup2(kept_, fd_);
+    close(kept_);
+  }
+  FreeDescriptor(const FreeDescriptor&) = delete;
+  FreeDescriptor& operator=(const FreeDescriptor&) = delete;
+
+ private:
+  const int fd_;
+  const int kept_;
+};
+
 TEST(ApkInit, DescriptorZeroFromItsOwnOpenCountsAsAFailure) {
   DiskFile file(MakePackage(WithoutDex()).Build());
   LogCapture log;
   Apk apk(-1);
   log.Clear();
-  const int standard_input = dup(0);
-  close(0);
-  errno = 0;
-  apk.Init(-1, file.path().c_str());
-  dup2(standard_input, 0);
-  close(standard_input);
+  {
+    const FreeDescriptor zero(0);
+    errno = 0;
+    apk.Init(-1, file.path().c_str());
+  }
   EXPECT_EQ(log.records(), Records({Error("open('" + file.path() + "') failed: Success\n")}));
   EXPECT_EQ(apk.GetFd(), 0);
   EXPECT_EQ(StateOf(apk), (State{false, false, false, false}));
+}
+
+TEST(ApkInit, DescriptorOneFromItsOwnOpenIsOneLikeOthers) {
+  DiskFile file(MakePackage(WithoutDex()).Build());
+  LogCapture log;
+  Apk apk(-1);
+  log.Clear();
+  {
+    const FreeDescriptor one(1);
+    apk.Init(-1, file.path().c_str());
+  }
+  EXPECT_EQ(log.records(), Records());
+  EXPECT_EQ(apk.GetFd(), 1);
+  EXPECT_TRUE(apk.IsGoodZip());
+}
+
+// Whoever gives it knows what it is.
+TEST(ApkInit, DescriptorZeroThatWasGivenIsUsed) {
+  DiskFile file(MakePackage(WithoutDex()).Build());
+  LogCapture log;
+  Apk apk(-1);
+  log.Clear();
+  {
+    const FreeDescriptor zero(0);
+    ASSERT_EQ(open(file.path().c_str(), O_RDONLY), 0);
+    apk.Init(0, nullptr);
+  }
+  EXPECT_EQ(log.records(), Records());
+  EXPECT_EQ(apk.GetPath(), file.path());
+  EXPECT_TRUE(apk.IsGoodZip());
 }
 
 TEST(ApkInit, AnyOtherNegativeDescriptorIsUsedUnchangedWhenThereIsAPath) {
