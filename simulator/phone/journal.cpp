@@ -38,8 +38,14 @@ Event& Event::Null(const char* key) {
   return *this;
 }
 
+Event& Event::Json(const char* key, std::string_view value) {
+  Key(key);
+  line_ += value;
+  return *this;
+}
+
 bool Event::AppendTo(int journal) const {
-  const std::string line = line_ + "}\n";
+  const std::string line = Line();
   return write(journal, line.data(), line.size()) == static_cast<ssize_t>(line.size());
 }
 

@@ -22,7 +22,11 @@ class Event {
   // As lower-case hexadecimal digits.
   Event& Hex(const char* key, std::string_view bytes);
   Event& Null(const char* key);
+  // A value that is JSON already.
+  Event& Json(const char* key, std::string_view value);
 
+  // The whole line, with its end.
+  std::string Line() const { return line_ + "}\n"; }
   // Appends the line to the open file `journal`; false when it could not be written whole.
   bool AppendTo(int journal) const;
 

@@ -62,6 +62,11 @@ STAND_IN int __android_log_buf_print(int, int priority, const char* tag, const c
   return result;
 }
 
+// What the platform's C++ libraries, the zip library among them, write their warnings through.
+STAND_IN void __android_log_write_logger_data(__android_logger_data* data, const char* text) {
+  Log(data->priority, data->tag, text);
+}
+
 STAND_IN void __android_log_assert(const char* condition, const char* tag, const char* format,
                                    ...) {
   if (format == nullptr) {

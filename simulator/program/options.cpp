@@ -1,8 +1,9 @@
 #include "simulator/program/options.h"
 
 #include <CLI/CLI.hpp>
+#include <algorithm>
 #include <cstring>
-#include <limits>
+#include <iostream>
 
 #include "simulator/phone/text.h"
 #include "simulator/program/run.h"
@@ -10,80 +11,109 @@
 namespace {
 
 constexpr char kDescription[] =
-    "Runs apktoolkit, as it is, for each FILE inside a simulated phone, and shows what a phone "
-    "would have done.";
+    "Runs apktoolkit, as it is, for each FILE inside a simulated phone, and tells what\n"
+    "the phone accepted of it, why not the rest, and what to change.";
 
 constexpr char kFooter[] =
     "Exit status, the highest of all FILEs:\n"
-    "  0  all that should be signed was signed: the file itself, every library beside it that\n"
-    "     was tried, and every key that was to be registered\n"
-    "  1  something was refused; the first reason is printed first\n"
+    "  0  all was signed that was to be signed\n"
+    "  1  something was refused\n"
     "  2  the command line is wrong\n"
-    "  3  the simulation itself could not run, or the tool did not end in time";
+    "  3  the simulation could not run, or did not end in time\n"
+    "  4  the tool could not look at a FILE: missing, no permission, read-only\n"
+    "More, with examples: man apktoolkit-sim";
 
-void AddPhone(CLI::App* app, PhoneSettings* phone);
+constexpr char kInstall[] = "--install";
+constexpr struct {
+  const char* name;
+  InstalledAbi abi;
+} kAbis[] = {{"phone", InstalledAbi::kPhone},
+             {"all", InstalledAbi::kAll},
+             {"arm64", InstalledAbi::kArm64},
+             {"arm", InstalledAbi::kArm}};
+
+constexpr char kThePhone[] = "The phone";
+constexpr char kTheRun[] = "The run";
+
+std::vector<std::string> WordsOf(int argc, char** argv);
+void AddPhone(CLI::App* app, Options* options);
 void AddKernelAnswer(CLI::App* app, const char* name, int* error, const char* description);
+void AddInstallation(CLI::App* app, Options* options);
+void AddOutput(CLI::App* app, Options* options);
+void AddRun(CLI::App* app, Options* options, std::string* runner);
 int ErrorNumber(const std::string& name);
+std::optional<int> CheckFiles(const CLI::App& app, const Options& options);
 
 }  // namespace
 
 std::optional<int> ParseOptions(int argc, char** argv, Options* options) {
   CLI::App app(kDescription, "apktoolkit-sim");
   app.footer(kFooter);
+  app.get_formatter()->column_width(28);
+  app.allow_extras();  // so that they can be named
   options->tool = ProgramDirectory() + "/apktoolkit";
-  options->timeout = 30;
   std::string runner;
 
-  AddPhone(&app, &options->phone);
-  app.add_option("--trust", options->trust, "The kernel trusts FILE (may be repeated)")
-      ->check(CLI::ExistingFile.description(""))
-      ->type_name("FILE")
-      ->allow_extra_args(false);
-  app.add_option("--state", options->state,
-                 "What was signed is remembered in DIR, and trusted while its bytes stay the same")
-      ->type_name("DIR");
-  app.add_option("--journal", options->journal, "Keep the journal in FILE")->type_name("FILE");
-  app.add_flag("--json", options->json, "Print the journal, one JSON object a line");
-  app.add_option("--tool", options->tool, "The program to run, if not the apktoolkit beside this")
-      ->type_name("PATH");
-  app.add_option("--timeout", options->timeout, "Give up a tool that takes longer")
-      ->type_name("SECONDS")
-      ->check(CLI::Range(0.001, 1e6).description(""))
-      ->capture_default_str();
-  app.add_option("--runner", runner,
-                 "Words to put before the tool: an emulator that takes -E NAME=VALUE")
-      ->type_name("COMMAND")
-      ->take_last();
-  app.add_option("FILE", options->files, "Packages, JARs or other files")
-      ->type_name("")
-      ->required();
-
+  app.add_option("FILE", options->files, "Packages, JARs or other files")->type_name("");
+  AddPhone(&app, options);
+  AddInstallation(&app, options);
+  AddOutput(&app, options);
+  AddRun(&app, options, &runner);
+  app.set_help_flag("-h,--help", "Print this help")->group(kTheRun);
+  app.set_version_flag("--version", "apktoolkit-sim " APKTOOLKIT_VERSION, "Print the version")
+      ->group(kTheRun);
   try {
-    app.parse(argc, argv);
+    app.parse(WordsOf(argc, argv));
   } catch (const CLI::ParseError& error) {
     return app.exit(error) == 0 ? 0 : kUsageError;
   }
   for (const std::string& word : Split(runner, ' ')) {
     if (!word.empty()) options->runner.push_back(word);
   }
-  return {};
+  return CheckFiles(app, *options);
 }
 
 namespace {
 
-void AddPhone(CLI::App* app, PhoneSettings* phone) {
+// The command line as CLI11 takes it, from the back, with the value that an --install without one
+// stands for: the word after it is a file.
+std::vector<std::string> WordsOf(int argc, char** argv) {
+  std::vector<std::string> words(argv + std::min(argc, 1), argv + argc);
+  const auto end_of_options = std::find(words.begin(), words.end(), "--");
+  std::replace(words.begin(), end_of_options, std::string(kInstall),
+               std::string(kInstall) + "=" + kAbis[0].name);
+  std::reverse(words.begin(), words.end());
+  return words;
+}
+
+void AddPhone(CLI::App* app, Options* options) {
+  PhoneSettings* const phone = &options->phone;
   app->add_option_function<std::string>(
          "--integrity", [phone](const std::string& text) { phone->integrity = Split(text, ','); },
-         "What the tool reads as its integrity value; the last TEXT repeats, \"missing\" is a "
-         "file that is not there [1f]")
-      ->type_name("TEXT[,TEXT]...");
+         "What the tool reads as its integrity value;\n"
+         "the last repeats, \"missing\" is no file\n"
+         "[default: 1f]")
+      ->type_name("TEXT[,TEXT]...")
+      ->group(kThePhone);
   AddKernelAnswer(app, "--sign-errno", &phone->sign_errno,
-                  "The kernel answers every signing with this error, such as EPERM");
+                  "The kernel answers every signing with this\n"
+                  "error, such as EPERM [default: it signs]");
   AddKernelAnswer(app, "--verify-errno", &phone->verify_errno,
-                  "The kernel's answer for a file that it does not trust [ENOKEY]");
-  app->add_option("--zu-result", phone->zu_result, "What libzu answers")
+                  "The kernel's answer for a file that it does\n"
+                  "not trust [default: ENOKEY]");
+  app->add_option("--zu-result", phone->zu_result, "What libzu answers [default: 0]")
       ->type_name("N")
-      ->capture_default_str();
+      ->group(kThePhone);
+  app->add_option("--trust", options->trust, "The kernel trusts this file; may be repeated")
+      ->check(CLI::ExistingFile.description(""))
+      ->type_name("FILE")
+      ->allow_extra_args(false)
+      ->group(kThePhone);
+  app->add_option("--state", options->state,
+                  "Remember in DIR what was signed, and trust it\n"
+                  "while its bytes stay the same")
+      ->type_name("DIR")
+      ->group(kThePhone);
 }
 
 void AddKernelAnswer(CLI::App* app, const char* name, int* error, const char* description) {
@@ -91,7 +121,92 @@ void AddKernelAnswer(CLI::App* app, const char* name, int* error, const char* de
     return ErrorNumber(text) == 0 ? "no error has the name " + text : std::string();
   };
   const auto set = [error](const std::string& text) { *error = ErrorNumber(text); };
-  app->add_option_function<std::string>(name, set, description)->type_name("NAME")->check(check);
+  app->add_option_function<std::string>(name, set, description)
+      ->type_name("NAME")
+      ->check(check)
+      ->group(kThePhone);
+}
+
+void AddInstallation(CLI::App* app, Options* options) {
+  const auto install = [options](const std::string& name) {
+    for (const auto& abi : kAbis) {
+      if (name == abi.name) options->abi = abi.abi;
+    }
+  };
+  const auto check = [](const std::string& name) {
+    const bool is_known = std::any_of(std::begin(kAbis), std::end(kAbis),
+                                      [&name](const auto& abi) { return name == abi.name; });
+    return is_known ? std::string() : "there are phone, all, arm64 and arm, and no " + name;
+  };
+  app->add_option_function<std::string>(kInstall, install,
+                                        "Lay the libraries out first, as an installer\n"
+                                        "does, in a folder of their own: for phone, all,\n"
+                                        "arm64 or arm [default: phone]")
+      ->type_name("[=ABI]")
+      ->check(check)
+      ->group(kTheRun);
+  app->add_flag("--strict", options->is_strict,
+                "A library that does not lie beside its package\n"
+                "counts as refused")
+      ->group(kTheRun);
+}
+
+void AddOutput(CLI::App* app, Options* options) {
+  CLI::Option* const quiet =
+      app->add_flag_function(
+             "--quiet", [options](int64_t) { options->detail = Detail::kVerdict; },
+             "Print the verdicts alone")
+          ->group(kTheRun);
+  app->add_flag_function(
+         "--verbose", [options](int64_t) { options->detail = Detail::kAll; },
+         "Print also what the signature leaves out, every\n"
+         "signer, and the chain from key to entries")
+      ->excludes(quiet)
+      ->group(kTheRun);
+  app->add_flag("--json", options->json, "Print the journal, one JSON object a line")
+      ->group(kTheRun);
+  app->add_option("--journal", options->journal, "Keep the journal in FILE")
+      ->type_name("FILE")
+      ->group(kTheRun);
+}
+
+void AddRun(CLI::App* app, Options* options, std::string* runner) {
+  app->add_option("--jobs", options->jobs, "Look at so many files at a time [default: 1]")
+      ->type_name("N")
+      ->check(CLI::Range(1, 1024).description(""))
+      ->group(kTheRun);
+  app->add_option("--timeout", options->timeout,
+                  "Give up a file that takes longer\n"
+                  "[default: 30]")
+      ->type_name("SECONDS")
+      ->check(CLI::Range(0.001, 1e6).description(""))
+      ->group(kTheRun);
+  app->add_option("--tool", options->tool,
+                  "The program to run [default: the apktoolkit\n"
+                  "beside this program]")
+      ->type_name("PATH")
+      ->group(kTheRun);
+  app->add_option("--runner", *runner,
+                  "Words to put before the tool: an emulator that\n"
+                  "takes -E NAME=VALUE [default: none]")
+      ->type_name("COMMAND")
+      ->take_last()
+      ->group(kTheRun);
+}
+
+// What begins with "-" and is no option may have been meant for a file.
+std::optional<int> CheckFiles(const CLI::App& app, const Options& options) {
+  const std::vector<std::string> unknown = app.remaining();
+  if (!unknown.empty()) {
+    std::cerr << "there is no option " << unknown[0] << " (a file of that name: ./" << unknown[0]
+              << ")\nRun with --help for more information.\n";
+    return kUsageError;
+  }
+  if (options.files.empty()) {
+    std::cerr << "FILE is required\nRun with --help for more information.\n";
+    return kUsageError;
+  }
+  return {};
 }
 
 // 0 when there is no error of this name.

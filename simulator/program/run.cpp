@@ -11,6 +11,8 @@
 #include <map>
 #include <thread>
 
+#include "simulator/program/process.h"
+
 namespace {
 
 using Words = std::vector<std::string>;
@@ -18,18 +20,22 @@ using Words = std::vector<std::string>;
 Words WordsOf(const Command& command, Words* environment);
 Words EnvironmentWith(const Words& assignments);
 int Spawn(Words words, Words environment, pid_t* child);
-Ending Wait(pid_t child, double timeout);
+Ending Wait(pid_t child, const Deadline& deadline);
 std::vector<char*> Pointers(Words* words);
 
 }  // namespace
 
-Ending Run(const Command& command) {
+Ending Run(const Command& command, const Deadline& deadline) {
   Words environment = command.environment;
   const Words words = WordsOf(command, &environment);
   pid_t child = 0;
   const int error = Spawn(words, EnvironmentWith(environment), &child);
   if (error != 0) return {End::kNotStarted, error};
-  return Wait(child, command.timeout);
+  return Wait(child, deadline);
+}
+
+const std::string& ProgramOf(const Command& command) {
+  return command.runner.empty() ? command.tool : command.runner[0];
 }
 
 std::string ProgramDirectory() {
@@ -89,13 +95,11 @@ std::vector<char*> Pointers(Words* words) {
   return pointers;
 }
 
-Ending Wait(pid_t child, double timeout) {
-  using Clock = std::chrono::steady_clock;
-  const auto end = Clock::now() + std::chrono::duration<double>(timeout);
+Ending Wait(pid_t child, const Deadline& deadline) {
   int status = 0;
   bool timed_out = false;
   while (waitpid(child, &status, WNOHANG) == 0) {
-    if (Clock::now() < end) {
+    if (!deadline.HasPassed() && !IsInterrupted()) {
       std::this_thread::sleep_for(std::chrono::milliseconds(2));
     } else {
       timed_out = true;

@@ -4,13 +4,14 @@
 #include <string>
 #include <vector>
 
+#include "simulator/program/deadline.h"
+
 struct Command {
   std::vector<std::string> runner;  // words before the tool, such as an emulator's; mostly none
   std::string tool;
   std::string file;                      // the tool's one argument
   std::string kernel;                    // the library that is loaded before all others
   std::vector<std::string> environment;  // NAME=VALUE, over what this process has
-  double timeout;                        // seconds
 };
 
 enum class End { kExited, kKilled, kTimedOut, kNotStarted };
@@ -21,8 +22,12 @@ struct Ending {
 };
 
 // Runs the command to its end. Its standard output goes nowhere, since the journal has it; its
-// standard error is this process's. When the time is up, the tool is killed.
-Ending Run(const Command& command);
+// standard input and error are this process's. When the time is up, or this process is to end, the
+// tool is killed.
+Ending Run(const Command& command, const Deadline& deadline);
+
+// The program that is started: the runner, or else the tool.
+const std::string& ProgramOf(const Command& command);
 
 // The directory that this program lies in, without a closing "/". The tool lies beside it, and the
 // stand-ins in ../lib/apktoolkit, in the build tree as where it is installed.

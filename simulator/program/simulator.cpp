@@ -14,7 +14,7 @@
 
 #include "simulator/phone/journal.h"
 #include "simulator/phone/text.h"
-#include "simulator/program/run.h"
+#include "simulator/program/verdict_event.h"
 
 namespace {
 
@@ -26,13 +26,7 @@ bool Fail(const std::string& message, std::string* error) {
 }
 
 // Why the last system call failed, as the end of a message.
-std::string ErrnoText() { return std::string(": ") + strerror(errno); }
-
-std::string Seconds(double seconds) {
-  std::ostringstream text;
-  text << seconds << (seconds == 1 ? " second" : " seconds");
-  return text.str();
-}
+std::string ErrnoText() { return std::string(": ") + strerrordesc_np(errno); }
 
 // As the kernel names the file once it is open.
 std::string Resolved(const std::string& file) {
@@ -51,118 +45,140 @@ std::string OwnDescriptorPath(int fd) {
   return "/proc/" + std::to_string(getpid()) + "/fd/" + std::to_string(fd);
 }
 
+std::string ContentOf(int fd) {
+  std::string content;
+  char part[1 << 16];
+  ssize_t length;
+  while ((length = pread(fd, part, sizeof(part), static_cast<off_t>(content.size()))) > 0) {
+    content.append(part, static_cast<size_t>(length));
+  }
+  return content;
+}
+
 }  // namespace
 
-Simulator::Simulator(const Options& options)
+// Each run has a journal of its own, so that several may run at a time.
+struct Simulator::Task {
+  explicit Task(const Deadline& until)
+      : deadline(until), journal(memfd_create("journal", MFD_CLOEXEC)) {
+    if (journal >= 0) fcntl(journal, F_SETFL, O_APPEND);
+  }
+  ~Task() {
+    if (journal >= 0) close(journal);
+  }
+  Task(const Task&) = delete;
+  Task& operator=(const Task&) = delete;
+
+  void Fail(const Cause& why, const std::string& detail) { around.failure = {&why, detail}; }
+
+  const Deadline deadline;
+  const int journal;
+  std::string path;  // of the file that the tool is given, resolved
+  Circumstances around;
+};
+
+Simulator::Simulator(const Options& options, bool has_standard_input)
     : options_(options),
+      has_standard_input_(has_standard_input),
       kernel_(ProgramDirectory() + "/../lib/apktoolkit/libapktoolkit_kernel.so"),
-      signed_(options.state) {}
+      signed_(options.state, options.jobs == 1) {}
 
 Simulator::~Simulator() {
-  if (journal_ >= 0) close(journal_);
   if (kernel_descriptor_ >= 0) close(kernel_descriptor_);
 }
 
 bool Simulator::Prepare(std::string* error) {
-  if (!OpenJournalFile() ||
-      !Event("journal").Number("version", kJournalVersion).AppendTo(journal_)) {
-    return Fail("cannot write the journal " + options_.journal + ErrnoText(), error);
-  }
-  if (access(kernel_.c_str(), R_OK) != 0) {
-    return Fail("there is no stand-in " + kernel_ + ErrnoText(), error);
-  }
+  kernel_descriptor_ = open(kernel_.c_str(), O_RDONLY | O_CLOEXEC);
+  if (kernel_descriptor_ < 0) return Fail("there is no stand-in " + kernel_ + ErrnoText(), error);
   if (access(options_.tool.c_str(), X_OK) != 0) {
     return Fail("cannot run " + options_.tool + ErrnoText(), error);
   }
   return signed_.Load() || Fail("cannot use the directory " + options_.state, error);
 }
 
-bool Simulator::Run(const std::string& file, Events* events, std::string* error) {
-  const size_t before = Journal().size();
-  const std::string path = Resolved(file);
-  const bool ended = RunTool(file, path, error);
-  *events = EventsFrom(before);
-  if (!ended) return false;
-  const auto is_attached = [](const auto& event) { return TextOf(event, "event") == "attached"; };
-  if (std::none_of(events->begin(), events->end(), is_attached)) {
-    return Fail("the stand-ins were not loaded into " + options_.tool, error);
+Outcome Simulator::Run(const std::string& file) {
+  Task task((Deadline(options_.timeout)));
+  task.around.is_strict = options_.is_strict;
+  task.around.has_standard_input = has_standard_input_;
+  Installation installation;
+  std::string installed = file;
+  if (options_.abi) {
+    const auto problem = installation.LayOut(file, *options_.abi, task.deadline);
+    if (problem) task.Fail(cause::kNotInstalled, *problem);
+    installed = installation.path();
+    task.around.not_laid_out = installation.left_out();
   }
-  return RememberSigned(*events) || Fail("cannot write to " + options_.state, error);
+  task.path = Resolved(installed);
+  Event("start").Text("file", file).Text("path", task.path).AppendTo(task.journal);
+  if (task.around.failure.cause == nullptr) RunTool(installed, &task);
+
+  Outcome outcome;
+  outcome.journal = ContentOf(task.journal);
+  const Events events = ParseEvents(outcome.journal);
+  RememberSigned(events, &task);
+  outcome.report = MakeReport(events, LookAt(installed), task.around);
+  outcome.journal += VerdictEvent(outcome.report);
+  return outcome;
 }
 
-std::string Simulator::Journal() const {
-  std::string journal;
-  char part[1 << 16];
-  ssize_t length;
-  while ((length = pread(journal_, part, sizeof(part), static_cast<off_t>(journal.size()))) > 0) {
-    journal.append(part, static_cast<size_t>(length));
-  }
-  return journal;
-}
-
-// Opens the file that was asked for, or one without a name. Events are appended to either.
-bool Simulator::OpenJournalFile() {
-  constexpr int kFlags = O_RDWR | O_CREAT | O_TRUNC | O_APPEND | O_CLOEXEC;
-  const std::string& path = options_.journal;
-  journal_ = path.empty() ? memfd_create("journal", MFD_CLOEXEC) : open(path.c_str(), kFlags, 0666);
-  return journal_ >= 0 && fcntl(journal_, F_SETFL, O_APPEND) == 0;
-}
-
-// Runs the tool between the events "start" and "exit".
-bool Simulator::RunTool(const std::string& file, const std::string& path, std::string* error) {
-  Event("start").Text("file", file).Text("path", path).AppendTo(journal_);
-  const Command command = {
-      options_.runner, options_.tool, file, PreloadName(), SettingsToEnvironment(PhoneFor(path)),
-      options_.timeout};
-  const Ending ending = ::Run(command);
+// Runs the tool, and has the journal tell how it ended.
+void Simulator::RunTool(const std::string& file, Task* task) {
+  const PhoneSettings phone = PhoneFor(*task);
+  if (task->deadline.HasPassed()) return task->Fail(cause::kToolTimedOut, SecondsText());
+  const Command command = {options_.runner, options_.tool, file, PreloadName(),
+                           SettingsToEnvironment(phone)};
+  const Ending ending = ::Run(command, task->deadline);
   switch (ending.end) {
     case End::kNotStarted:
       errno = ending.value;
-      return Fail("cannot start " + options_.tool + ErrnoText(), error);
+      return task->Fail(cause::kToolNotStarted, "cannot start " + ProgramOf(command) + ErrnoText());
     case End::kTimedOut:
-      Event("exit").Number("signal", SIGKILL).AppendTo(journal_);
-      return Fail(options_.tool + " was still running after " + Seconds(options_.timeout) +
-                      " and was killed (it waits for ever while its integrity value is ffffffff)",
-                  error);
+      Event("exit").Number("signal", SIGKILL).AppendTo(task->journal);
+      return task->Fail(cause::kToolTimedOut, SecondsText());
     case End::kKilled:
-      return Event("exit").Number("signal", ending.value).AppendTo(journal_);
+      Event("exit").Number("signal", ending.value).AppendTo(task->journal);
+      break;
     case End::kExited:
-      return Event("exit").Number("status", ending.value).AppendTo(journal_);
+      Event("exit").Number("status", ending.value).AppendTo(task->journal);
+      break;
   }
-  return false;
+  const Events events = ParseEvents(ContentOf(task->journal));
+  const auto is_attached = [](const auto& event) { return TextOf(event, "event") == "attached"; };
+  if (std::none_of(events.begin(), events.end(), is_attached)) {
+    task->Fail(cause::kStandInsMissing, options_.tool);
+  }
 }
 
-// The phone as the run for the file at `path` finds it.
-PhoneSettings Simulator::PhoneFor(const std::string& path) const {
+// The phone as the run finds it.
+PhoneSettings Simulator::PhoneFor(const Task& task) {
   PhoneSettings phone = options_.phone;
-  phone.journal = OwnDescriptorPath(journal_);
+  phone.journal = OwnDescriptorPath(task.journal);
   for (const std::string& trusted : options_.trust) AddId(trusted, &phone.trusted);
-  if (signed_.Holds(path)) AddId(path, &phone.trusted);
+  if (signed_.Holds(task.path, task.deadline)) AddId(task.path, &phone.trusted);
   return phone;
 }
 
 // The loader takes spaces and colons for separators; a descriptor's path has none.
-std::string Simulator::PreloadName() {
+std::string Simulator::PreloadName() const {
   if (kernel_.find_first_of(" :") == std::string::npos) return kernel_;
-  if (kernel_descriptor_ < 0) kernel_descriptor_ = open(kernel_.c_str(), O_RDONLY | O_CLOEXEC);
   return OwnDescriptorPath(kernel_descriptor_);
 }
 
-// Lines that are no JSON are not ours and do not count.
-Events Simulator::EventsFrom(size_t offset) const {
-  Events events;
-  for (const std::string& line : Split(Journal().substr(offset), '\n')) {
-    auto event = nlohmann::json::parse(line, nullptr, false);
-    if (event.is_object()) events.push_back(std::move(event));
-  }
-  return events;
-}
-
-bool Simulator::RememberSigned(const Events& events) {
-  bool kept = true;
+void Simulator::RememberSigned(const Events& events, Task* task) {
   for (const auto& event : events) {
     const bool is_signed = TextOf(event, "event") == "sign" && NumberOf(event, "result") == 0;
-    if (is_signed) kept = signed_.Add(TextOf(event, "path")) && kept;
+    if (!is_signed || signed_.Add(TextOf(event, "path"), task->deadline)) continue;
+    if (task->deadline.HasPassed()) {
+      task->Fail(cause::kToolTimedOut, SecondsText());
+    } else {
+      task->Fail(cause::kStateNotKept, options_.state);
+    }
+    return;
   }
-  return kept;
+}
+
+std::string Simulator::SecondsText() const {
+  std::ostringstream text;
+  text << options_.timeout << (options_.timeout == 1 ? " second" : " seconds");
+  return text.str();
 }

@@ -1,42 +1,47 @@
-// One phone for all the files of a command line: its journal, what its kernel has signed so far,
-// and the runs of the tool inside it.
+// One phone for all the files of a command line: what its kernel has signed so far, and the runs of
+// the tool inside it.
 #pragma once
 
 #include <string>
 
+#include "simulator/program/make_report.h"
 #include "simulator/program/options.h"
+#include "simulator/program/run.h"
 #include "simulator/program/state.h"
-#include "simulator/program/verdict.h"
+
+// What came of one file.
+struct Outcome {
+  Report report;
+  std::string journal;  // the lines of this run, from "start" to "verdict"
+};
 
 class Simulator {
  public:
-  explicit Simulator(const Options& options);
+  Simulator(const Options& options, bool has_standard_input);
   ~Simulator();
   Simulator(const Simulator&) = delete;
   Simulator& operator=(const Simulator&) = delete;
 
-  // Opens the journal and the state and looks for the stand-ins. False, with `error` set to what
-  // to tell the user, when the simulation cannot begin.
+  // Opens the state and looks for the stand-ins and the tool. False, with `error` set to what to tell
+  // the user, when the simulation cannot begin.
   bool Prepare(std::string* error);
 
-  // Runs the tool for `file` and sets `events` to what happened. False, with `error` set, when
-  // the tool did not run inside the stand-ins to its end.
-  bool Run(const std::string& file, Events* events, std::string* error);
-
-  // All that was recorded so far, as it stands in the journal.
-  std::string Journal() const;
+  // Runs the tool for `file`. May be called from several threads when the options have several jobs.
+  Outcome Run(const std::string& file);
 
  private:
-  bool OpenJournalFile();
-  bool RunTool(const std::string& file, const std::string& path, std::string* error);
-  PhoneSettings PhoneFor(const std::string& path) const;
-  std::string PreloadName();
-  Events EventsFrom(size_t offset) const;
-  bool RememberSigned(const Events& events);
+  // One run on its way: what it needs, and what is to be told of it.
+  struct Task;
+
+  void RunTool(const std::string& file, Task* task);
+  PhoneSettings PhoneFor(const Task& task);
+  std::string PreloadName() const;
+  void RememberSigned(const Events& events, Task* task);
+  std::string SecondsText() const;
 
   const Options& options_;
+  const bool has_standard_input_;
   const std::string kernel_;  // the path of the kernel stand-in
   SignedBytes signed_;
-  int journal_ = -1;
-  int kernel_descriptor_ = -1;  // opened when it is needed
+  int kernel_descriptor_ = -1;
 };

@@ -1,11 +1,12 @@
-// The readable form of a run: the verdict first, then what happened, line by line.
+// The readable form of what happened, line by line and in order; nothing is left out.
 #pragma once
 
 #include <ostream>
 #include <string>
 
-#include "simulator/program/verdict.h"
+#include "simulator/program/events.h"
+#include "simulator/program/terminal.h"
 
-// Prints the run of `file` that `events` tell and `verdict` sums up, with colours or without.
-void PrintTimeline(const std::string& file, const Events& events, const Verdict& verdict,
-                   bool colours, std::ostream& out);
+// Prints the events of one run. Paths below the folder of the file at `path` are shown without it.
+void PrintTimeline(const Events& events, const std::string& path, const Look& look,
+                   std::ostream& out);

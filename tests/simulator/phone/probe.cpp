@@ -128,6 +128,12 @@ const std::map<std::string, Command> kCommands = {
      [](const Words& w) {
        return __android_log_write(Int(w[1]), w[2].c_str(), FromHex(w[3]).c_str());
      }},
+    {"log-data",
+     [](const Words& w) {
+       __android_logger_data data = {sizeof(data), 0, Int(w[1]), w[2].c_str(), nullptr, 0};
+       __android_log_write_logger_data(&data, FromHex(w[3]).c_str());
+       return 0;
+     }},
     {"log-assert",
      [](const Words& w) -> long { __android_log_assert("condition", w[1].c_str(), "why %d", 7); }},
     {"print", [](const Words& w) { return printf("%s", FromHex(w[1]).c_str()); }},

@@ -1,0 +1,13 @@
+// What a package's signature protects: by bytes, and as the chain from the key to the entries.
+#pragma once
+
+#include <vector>
+
+#include "simulator/package/facts.h"
+#include "simulator/program/report.h"
+
+// `items` are the report's: an entry is verified when what was checked against its digest was good.
+Protection FindProtection(const PackageFacts& facts, const std::vector<Item>& items);
+
+// Key, certificate, signature file, manifest, entries; `own` is the package's own item.
+std::vector<Link> MakeChain(const PackageFacts& facts, const Item& own);
