@@ -42,7 +42,7 @@ void AddInstallation(CLI::App* app, Options* options);
 void AddOutput(CLI::App* app, Options* options);
 void AddRun(CLI::App* app, Options* options, std::string* runner);
 int ErrorNumber(const std::string& name);
-std::optional<int> CheckFiles(const CLI::App& app, const Options& options);
+std::optional<int> NameUnknownOption(const CLI::App& app);
 
 }  // namespace
 
@@ -54,7 +54,9 @@ std::optional<int> ParseOptions(int argc, char** argv, Options* options) {
   options->tool = ProgramDirectory() + "/apktoolkit";
   std::string runner;
 
-  app.add_option("FILE", options->files, "Packages, JARs or other files")->type_name("");
+  app.add_option("FILE", options->files, "Packages, JARs or other files")
+      ->type_name("")
+      ->required();
   AddPhone(&app, options);
   AddInstallation(&app, options);
   AddOutput(&app, options);
@@ -64,13 +66,17 @@ std::optional<int> ParseOptions(int argc, char** argv, Options* options) {
       ->group(kTheRun);
   try {
     app.parse(WordsOf(argc, argv));
+  } catch (const CLI::RequiredError& error) {
+    if (const auto status = NameUnknownOption(app)) return status;
+    app.exit(error);
+    return kUsageError;
   } catch (const CLI::ParseError& error) {
     return app.exit(error) == 0 ? 0 : kUsageError;
   }
   for (const std::string& word : Split(runner, ' ')) {
     if (!word.empty()) options->runner.push_back(word);
   }
-  return CheckFiles(app, *options);
+  return NameUnknownOption(app);
 }
 
 namespace {
@@ -152,17 +158,19 @@ void AddInstallation(CLI::App* app, Options* options) {
 }
 
 void AddOutput(CLI::App* app, Options* options) {
-  CLI::Option* const quiet =
-      app->add_flag_function(
-             "--quiet", [options](int64_t) { options->detail = Detail::kVerdict; },
-             "Print the verdicts alone")
-          ->group(kTheRun);
-  app->add_flag_function(
-         "--verbose", [options](int64_t) { options->detail = Detail::kAll; },
-         "Print also what the signature leaves out, every\n"
-         "signer, and the chain from key to entries")
-      ->excludes(quiet)
-      ->group(kTheRun);
+  const auto print = [app, options](const char* name, Detail detail, const char* description) {
+    const auto set = [name, options, detail](int64_t) {
+      if (options->detail != Detail::kUsual) {
+        throw CLI::ValidationError(name, "--quiet and --verbose exclude each other");
+      }
+      options->detail = detail;
+    };
+    app->add_flag_function(name, set, description)->group(kTheRun);
+  };
+  print("--quiet", Detail::kVerdict, "Print the verdicts alone");
+  print("--verbose", Detail::kAll,
+        "Print also what the signature leaves out, every\n"
+        "signer, and the chain from key to entries");
   app->add_flag("--json", options->json, "Print the journal, one JSON object a line")
       ->group(kTheRun);
   app->add_option("--journal", options->journal, "Keep the journal in FILE")
@@ -195,18 +203,12 @@ void AddRun(CLI::App* app, Options* options, std::string* runner) {
 }
 
 // What begins with "-" and is no option may have been meant for a file.
-std::optional<int> CheckFiles(const CLI::App& app, const Options& options) {
+std::optional<int> NameUnknownOption(const CLI::App& app) {
   const std::vector<std::string> unknown = app.remaining();
-  if (!unknown.empty()) {
-    std::cerr << "there is no option " << unknown[0] << " (a file of that name: ./" << unknown[0]
-              << ")\nRun with --help for more information.\n";
-    return kUsageError;
-  }
-  if (options.files.empty()) {
-    std::cerr << "FILE is required\nRun with --help for more information.\n";
-    return kUsageError;
-  }
-  return {};
+  if (unknown.empty()) return {};
+  std::cerr << "there is no option " << unknown[0] << " (a file of that name: ./" << unknown[0]
+            << ")\nRun with --help for more information.\n";
+  return kUsageError;
 }
 
 // 0 when there is no error of this name.

@@ -42,7 +42,7 @@ TEST_F(CommandLine, MissingFileEndsSilently) {
   const Simulation run = Simulate(folder_ / "none.apk");
 
   EXPECT_EQ(run.timeline, Exit(0));
-  EXPECT_EQ(run.status, 1);  // the file was not signed
+  EXPECT_EQ(run.status, 4);  // the file was not looked at
 }
 
 // In a user namespace of its own the tool has no right to another user's files, not even as root.
@@ -52,7 +52,7 @@ TEST_F(CommandLine, FileThatMayNotBeReadEndsSilently) {
   const Simulation run = Simulate(apk_, {}, {{"unshare", "-U"}, {}});
 
   EXPECT_EQ(run.timeline, Exit(0));
-  EXPECT_EQ(run.status, 1);  // the file was not signed
+  EXPECT_EQ(run.status, 4);  // the file was not looked at
 }
 
 // The words that run a command with `package` copied to `mount_point`/base.apk, on a file system of
@@ -76,7 +76,7 @@ TEST_F(CommandLine, FileOnAReadOnlyFileSystemEndsSilently) {
       Simulate(apk, {}, {OnItsOwnFileSystem(apk_, mount_point.path(), "ro"), {}});
 
   EXPECT_EQ(run.timeline, Exit(0));
-  EXPECT_EQ(run.status, 1);  // the file was not signed
+  EXPECT_EQ(run.status, 4);  // the file was not looked at
 }
 
 TEST_F(CommandLine, FileOnTheSameFileSystemWritableIsWorkedOn) {

@@ -28,6 +28,14 @@ TEST(Log, KeepsPriorityTagAndText) {
                                LogEvent(5, "tag", "%")}));
 }
 
+// The platform's zip library warns in this way.
+TEST(Log, KeepsWhatThePlatformsLibrariesWriteByThemselves) {
+  const ProbeRun run = Probe({"log-data 5 ziparchive 5a6970"}).Run();
+  EXPECT_EQ(run.results, Lines({"0 77"}));
+  EXPECT_EQ(OfKind(run.events, "log"), std::vector<Json>({LogEvent(5, "ziparchive", "Zip")}));
+  EXPECT_EQ(run.errors, "");
+}
+
 TEST(Log, TextsAreBytes) {
   EXPECT_EQ(OfKind(Probe({"log 4 tag e9c3a9ff"}).Run().events, "log"),
             std::vector<Json>({LogEvent(4, "tag", "\uf7e9\u00e9\uf7ff|5\n")}));

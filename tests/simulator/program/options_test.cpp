@@ -45,6 +45,10 @@ TEST(Options, DefaultIsAHealthyPhone) {
   EXPECT_EQ(options.tool, ProgramDirectory() + "/apktoolkit");
   EXPECT_EQ(options.runner, Lines());
   EXPECT_EQ(options.timeout, 30);
+  EXPECT_EQ(options.abi, std::nullopt);
+  EXPECT_FALSE(options.is_strict);
+  EXPECT_EQ(options.detail, Detail::kUsual);
+  EXPECT_EQ(options.jobs, 1U);
 }
 
 TEST(Options, EachChangesItsPartOfThePhone) {
@@ -80,6 +84,23 @@ TEST(Options, TheRestIsTakenAsItIs) {
   EXPECT_EQ(options.files, Lines({"-a.apk"}));
 }
 
+TEST(Options, WordsOfTheRunAreTakenAsTheyAre) {
+  EXPECT_EQ(Parsed({"--quiet", "a.apk"}).detail, Detail::kVerdict);
+  EXPECT_EQ(Parsed({"--verbose", "a.apk"}).detail, Detail::kAll);
+  EXPECT_TRUE(Parsed({"--strict", "a.apk"}).is_strict);
+  EXPECT_EQ(Parsed({"--jobs", "8", "a.apk"}).jobs, 8U);
+}
+
+TEST(Options, InstallTakesItsValueAfterAnEqualsSignAlone) {
+  EXPECT_EQ(Parsed({"--install=all", "a.apk"}).abi, InstalledAbi::kAll);
+  EXPECT_EQ(Parsed({"--install=arm64", "a.apk"}).abi, InstalledAbi::kArm64);
+  EXPECT_EQ(Parsed({"--install=arm", "a.apk"}).abi, InstalledAbi::kArm);
+  const Options options = Parsed({"--install", "arm"});
+  EXPECT_EQ(options.abi, InstalledAbi::kPhone);
+  EXPECT_EQ(options.files, Lines({"arm"}));
+  EXPECT_EQ(Parsed({"--", "--install"}).files, Lines({"--install"}));
+}
+
 TEST(Options, MistakesAreReportedWithStatusTwo) {
   const std::vector<Lines> mistakes = {{},
                                        {"--nonsense", "a.apk"},
@@ -91,6 +112,11 @@ TEST(Options, MistakesAreReportedWithStatusTwo) {
                                        {"--trust", "/nowhere/at-all", "a.apk"},
                                        {"--timeout", "0", "a.apk"},
                                        {"--timeout", "-1", "a.apk"},
+                                       {"--jobs", "0", "a.apk"},
+                                       {"--jobs", "x", "a.apk"},
+                                       {"--install=x86", "a.apk"},
+                                       {"--install"},
+                                       {"--quiet", "--verbose", "a.apk"},
                                        {"--integrity"}};
   for (const Lines& words : mistakes) {
     const ProcessResult result = Told(words);
@@ -105,14 +131,37 @@ TEST(Options, AnUnknownErrorIsNamed) {
             "--sign-errno: no error has the name EWHAT");
 }
 
+TEST(Options, FileThatLooksLikeAnOptionIsNamed) {
+  EXPECT_EQ(LinesOf(Told({"-dash.apk"}).errors)[0],
+            "there is no option -dash.apk (a file of that name: ./-dash.apk)");
+}
+
 TEST(Options, HelpNamesEveryOptionAndStatus) {
   const ProcessResult result = Told({"--help"});
   EXPECT_EQ(result.status, 0);
   EXPECT_EQ(result.errors, "");
-  for (const char* word : {"--integrity TEXT[,TEXT]...", "--trust FILE ", "--sign-errno NAME",
-                           "--verify-errno NAME", "--zu-result N", "--state DIR", "--journal FILE",
-                           "--json", "--tool PATH", "--timeout SECONDS", "--runner COMMAND",
-                           "\n  0  all that", "\n  1  ", "\n  2  ", "\n  3  "}) {
+  for (const char* word :
+       {"\nThe phone:\n", "--integrity TEXT[,TEXT]...", "--trust FILE ", "--sign-errno NAME",
+        "--verify-errno NAME", "--zu-result N", "--state DIR", "\nThe run:\n", "--install [=ABI]",
+        "--strict ", "--quiet ", "--verbose ", "--journal FILE", "--json ", "--jobs N",
+        "--tool PATH", "--timeout SECONDS", "--runner COMMAND", "--help ", "--version ",
+        "\n  0  all was", "\n  1  ", "\n  2  ", "\n  3  ", "\n  4  ", "man apktoolkit-sim"}) {
     EXPECT_NE(result.output.find(word), std::string::npos) << word << "\n" << result.output;
   }
+}
+
+TEST(Options, HelpFitsATerminalAndShowsDefaultsInOneWay) {
+  constexpr size_t kColumns = 80;
+  std::string help = Told({"--help"}).output;
+  for (const std::string& line : LinesOf(help)) EXPECT_LE(line.size(), kColumns) << line;
+  EXPECT_EQ(help.find("=30"), std::string::npos);
+  size_t defaults = 0;
+  for (size_t at = 0; (at = help.find("[default: ", at)) != std::string::npos; ++at) ++defaults;
+  EXPECT_EQ(defaults, 9U);
+}
+
+TEST(Options, VersionIsTheProjects) {
+  const ProcessResult result = Told({"--version"});
+  EXPECT_EQ(result.status, 0);
+  EXPECT_EQ(result.output, "apktoolkit-sim " APKTOOLKIT_VERSION "\n");
 }

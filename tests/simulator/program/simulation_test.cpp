@@ -2,6 +2,7 @@
 #include <sys/stat.h>
 #include <unistd.h>
 
+#include <algorithm>
 #include <filesystem>
 
 #include "simulator/phone/probe_run.h"
@@ -11,9 +12,30 @@
 
 namespace {
 
-// Runs apktoolkit-sim with the probe as the tool.
-ProcessResult Simulated(const Lines& words) {
-  Lines command = {SimulatorPath(), "--tool", PROBE_PATH};
+// Runs apktoolkit-sim for somebody who reads UTF-8.
+ProcessResult Told(const Lines& words) {
+  Lines command = {"env", "LC_ALL=C.UTF-8", SimulatorPath()};
+  command.insert(command.end(), words.begin(), words.end());
+  return RunProcess(command);
+}
+
+// The same with the probe as the tool.
+ProcessResult Simulated(Lines words) {
+  words.insert(words.begin(), {"--tool", PROBE_PATH});
+  return Told(words);
+}
+
+// The first lines of what is printed.
+Lines FirstLines(const ProcessResult& result, size_t count) {
+  Lines lines = LinesOf(result.output);
+  lines.resize(std::min(lines.size(), count));
+  return lines;
+}
+
+// What the shell makes of a command line: `script`, in which "$@" is the simulator with the probe
+// as its tool.
+ProcessResult InShell(const std::string& script, const Lines& words) {
+  Lines command = {"bash", "-c", script, "bash", SimulatorPath(), "--tool", PROBE_PATH};
   command.insert(command.end(), words.begin(), words.end());
   return RunProcess(command);
 }
@@ -25,7 +47,7 @@ TEST(ExitStatus, ZeroWhenAllWasSigned) {
   const ProcessResult result = Simulated({probe.path()});
   EXPECT_EQ(result.status, 0);
   EXPECT_EQ(result.errors, "");
-  EXPECT_EQ(LinesOf(result.output)[0], "SIGNED " + probe.path() + ": the package");
+  EXPECT_EQ(LinesOf(result.output)[0], "SIGNED  " + probe.path());
 }
 
 TEST(ExitStatus, OneWhenSomethingWasRefused) {
@@ -33,7 +55,8 @@ TEST(ExitStatus, OneWhenSomethingWasRefused) {
   const ProcessResult result = Simulated({probe.path()});
   EXPECT_EQ(result.status, 1);
   EXPECT_EQ(result.errors, "");
-  EXPECT_EQ(LinesOf(result.output)[0], "REFUSED " + probe.path() + ": a|5");
+  EXPECT_EQ(FirstLines(result, 2),
+            Lines({"REFUSED  " + probe.path(), "  ✗ package  not signed: it logged an error: a|5"}));
 }
 
 TEST(ExitStatus, OneWhenTheToolWasKilled) {
@@ -49,21 +72,75 @@ TEST(ExitStatus, OneWhenTheToolFailed) {
   EXPECT_EQ(run.events.back(), Json({{"event", "exit"}, {"status", 3}}));
 }
 
-TEST(ExitStatus, OneForAFileThatIsNotThere) {
-  const ProcessResult result = RunProcess({SimulatorPath(), "/nowhere/base.apk"});
-  EXPECT_EQ(result.status, 1);
-  EXPECT_EQ(LinesOf(result.output)[0],
-            "REFUSED /nowhere/base.apk: the tool left it alone: it cannot be opened, or lies on a "
-            "read-only file system");
+TEST(ExitStatus, FourForAFileThatIsNotThere) {
+  const ProcessResult result = Told({"/nowhere/base.apk"});
+  EXPECT_EQ(result.status, 4);
+  EXPECT_EQ(result.output,
+            "NOT LOOKED AT  /nowhere/base.apk\n"
+            "  ✗ file  not looked at: there is no such file\n"
+            "      Check the name; a relative one counts from the folder in which the tool is\n"
+            "      run.\n"
+            "   1  exit       status 0\n");
+}
+
+TEST(ExitStatus, FourWhenStandardInputIsClosed) {
+  const TempDir folder;
+  const std::string file = folder.Write("note.txt", ToBytes("hello\n"));
+  const ProcessResult result = RunProcess({"bash", "-c", "exec \"$@\" <&-", "bash",
+                                           SimulatorPath(), file});
+  EXPECT_EQ(result.status, 4);
+  EXPECT_NE(result.output.find("standard input is closed"), std::string::npos) << result.output;
 }
 
 TEST(ExitStatus, ThreeWhenTheToolDoesNotEnd) {
-  const ProbeRun run = Probe({"sign 3 0100ab", "sleep 60"}).Run({"--timeout", "3"});
+  const Probe probe({"sign 3 0100ab", "sleep 60"});
+  const ProbeRun run = probe.Run({"--timeout", "3"});
   EXPECT_EQ(run.status, 3);
-  EXPECT_EQ(run.errors, std::string("apktoolkit-sim: ") + PROBE_PATH +
-                            " was still running after 3 seconds and was killed (it waits for ever "
-                            "while its integrity value is ffffffff)\n");
+  EXPECT_EQ(run.errors, "apktoolkit-sim: " + probe.path() +
+                            ": it was still busy after 3 seconds and was stopped\n");
   EXPECT_EQ(run.events.back(), Json({{"event", "exit"}, {"signal", 9}}));
+}
+
+// Opening a pipe waits for a writer; a device has no end.
+TEST(ExitStatus, ThreeWhenAPipeKeepsTheToolWaiting) {
+  const TempDir folder;
+  const std::string pipe = folder / "pipe";
+  ASSERT_EQ(mkfifo(pipe.c_str(), 0600), 0);
+  const TempDir state;
+  const ProcessResult result = Told({"--timeout", "0.5", "--state", state.path(), pipe});
+  EXPECT_EQ(result.status, 3);
+  EXPECT_EQ(FirstLines(result, 2),
+            Lines({"NOT SIMULATED  " + pipe,
+                   "  ✗ tool  it was still busy after 0.5 seconds and was stopped"}));
+}
+
+TEST(ExitStatus, OneForADevice) {
+  const TempDir state;
+  const ProcessResult result = Told({"--state", state.path(), "/dev/zero"});
+  EXPECT_EQ(result.status, 1);
+  EXPECT_EQ(FirstLines(result, 2),
+            Lines({"REFUSED  /dev/zero",
+                   "  ✗ file  not signed: it is a device, a pipe or a socket"}));
+}
+
+TEST(ExitStatus, ThreeWhenAnotherProgramIsTheTool) {
+  if (AreProgramsEmulated()) GTEST_SKIP() << "the program is for another processor";
+  const TempDir folder;
+  const std::string file = folder.Write("note.txt", ToBytes("hello\n"));
+  const ProcessResult result = Told({"--tool", "/bin/true", file});
+  EXPECT_EQ(result.status, 3);
+  EXPECT_EQ(result.errors, "apktoolkit-sim: " + file +
+                               ": the tool neither said nor did anything, though the file can be "
+                               "opened\n");
+}
+
+TEST(ExitStatus, ThreeWhenStandardOutputIsFullOrClosed) {
+  const Probe probe({"sign 3 0100ab"});
+  for (const char* script : {"exec \"$@\" >/dev/full", "exec \"$@\" >&-"}) {
+    const ProcessResult result = InShell(script, {probe.path()});
+    EXPECT_EQ(result.status, 3) << script;
+    EXPECT_EQ(result.errors, "apktoolkit-sim: cannot write to standard output\n");
+  }
 }
 
 TEST(ExitStatus, ThreeWhenThereIsNoTool) {
@@ -79,7 +156,7 @@ TEST(ExitStatus, ThreeWhenTheToolIsNoProgram) {
   ASSERT_EQ(chmod(tool.c_str(), 0755), 0);
   const ProcessResult result = RunProcess({SimulatorPath(), "--tool", tool, "/"});
   EXPECT_EQ(result.status, 3);
-  EXPECT_EQ(result.errors, "apktoolkit-sim: cannot start " + tool + ": Exec format error\n");
+  EXPECT_EQ(result.errors, "apktoolkit-sim: /: cannot start " + tool + ": Exec format error\n");
 }
 
 TEST(ExitStatus, ThreeWhenTheStandInsAreNotInTheTool) {
@@ -92,11 +169,11 @@ TEST(ExitStatus, ThreeWhenTheStandInsAreNotInTheTool) {
       RunProcess({SimulatorPath(), "--runner", "/nowhere/emulator", "--tool", tool, "/"});
   EXPECT_EQ(result.status, 3);
   EXPECT_EQ(result.errors,
-            "apktoolkit-sim: cannot start " + tool + ": No such file or directory\n");
+            "apktoolkit-sim: /: cannot start /nowhere/emulator: No such file or directory\n");
   const ProcessResult runner =
       RunProcess({SimulatorPath(), "--runner", "true", "--tool", tool, "/"});
   EXPECT_EQ(runner.status, 3);
-  EXPECT_EQ(runner.errors, "apktoolkit-sim: the stand-ins were not loaded into " + tool + "\n");
+  EXPECT_EQ(runner.errors, "apktoolkit-sim: /: the stand-ins were not loaded into " + tool + "\n");
 }
 
 TEST(ExitStatus, ThreeWhenTheJournalCannotBeWritten) {
@@ -113,14 +190,92 @@ TEST(ExitStatus, ThreeWhenTheStateCannotBeKept) {
   EXPECT_EQ(result.errors, "apktoolkit-sim: cannot use the directory /dev/null\n");
 }
 
+TEST(ExitStatus, TwoWhenTheJournalWouldReplaceAFile) {
+  const Probe probe({"sign 3 0000"});
+  const std::string before = ContentOf(probe.path());
+  const ProcessResult result = Simulated({"--journal", probe.path(), probe.path()});
+  EXPECT_EQ(result.status, 2);
+  EXPECT_EQ(result.output, "");
+  EXPECT_EQ(result.errors, "apktoolkit-sim: --journal " + probe.path() +
+                               " is a file that is to be looked at; it is left alone\n");
+  EXPECT_EQ(ContentOf(probe.path()), before);
+}
+
 TEST(ExitStatus, IsTheHighestOfAllFiles) {
   const Probe good({"sign 3 0000"});
   const Probe bad({"verify 3"});
   EXPECT_EQ(Simulated({good.path(), good.path()}).status, 0);
   const ProcessResult result = Simulated({good.path(), bad.path(), good.path()});
   EXPECT_EQ(result.status, 1);
-  const std::string verdict = "REFUSED " + bad.path() + ": the kernel does not trust it (ENOKEY";
-  EXPECT_NE(result.output.find("\n" + verdict), std::string::npos) << result.output;
+  EXPECT_EQ(Simulated({"/nowhere/a", bad.path()}).status, 4);
+}
+
+TEST(Files, AreSetApartAndSummedUp) {
+  const Probe good({"sign 3 0000"});
+  const Probe bad({"verify 3"});
+  const ProcessResult result = Simulated({good.path(), bad.path(), good.path()});
+  EXPECT_NE(result.output.find("\n\nNOT TRUSTED JAR  " + bad.path() + "\n"), std::string::npos)
+      << result.output;
+  EXPECT_EQ(LinesOf(result.output).back(), "3 files: 2 trusted JARs, 1 JARs not trusted");
+}
+
+TEST(Files, AreVerdictsAloneWhenAsked) {
+  const Probe good({"sign 3 0000"});
+  const Probe bad({"verify 3"});
+  EXPECT_EQ(Simulated({"--quiet", good.path(), bad.path()}).output,
+            "TRUSTED JAR  " + good.path() + "\nNOT TRUSTED JAR  " + bad.path() + "\n");
+}
+
+// The first takes longest; what is told keeps the order of the command line.
+TEST(Files, KeepTheirOrderWhenSeveralRunAtATime) {
+  const Probe slow({"sign 3 0000", "sleep 1"});
+  const Probe quick({"verify 3"});
+  const Lines files = {slow.path(), quick.path(), quick.path(), quick.path()};
+  const TempDir folder;
+  const std::string journal = folder / "journal";
+  Lines words = {"--jobs", "4", "--quiet", "--journal", journal};
+  words.insert(words.end(), files.begin(), files.end());
+  const ProcessResult result = Simulated(words);
+  EXPECT_EQ(LinesOf(result.output),
+            Lines({"TRUSTED JAR  " + slow.path(), "NOT TRUSTED JAR  " + quick.path(),
+                   "NOT TRUSTED JAR  " + quick.path(), "NOT TRUSTED JAR  " + quick.path()}));
+  Lines started;
+  std::string last_event;
+  for (const Json& event : ParseJournal(ContentOf(journal))) {
+    if (event["event"] == "start") {
+      EXPECT_TRUE(started.empty() || last_event == "verdict") << "runs are not mixed";
+      started.push_back(event["file"]);
+    }
+    last_event = event["event"];
+  }
+  EXPECT_EQ(started, files);
+}
+
+// Whoever looks at a pipe sees no line that is overwritten.
+TEST(Files, ShowNoProgressWithoutATerminal) {
+  const Probe slow({"sign 3 0000", "sleep 2"});
+  EXPECT_EQ(Simulated({slow.path()}).errors, "");
+}
+
+// util-linux's script gives it a terminal.
+TEST(Files, ShowProgressOnATerminalWhenItTakesLonger) {
+  const Probe slow({"sign 3 0000", "sleep 2"});
+  const ProcessResult result =
+      RunProcess({"script", "-qec", SimulatorPath() + " --quiet --tool " + PROBE_PATH + " " +
+                                        slow.path(),
+                  "/dev/null"});
+  const size_t progress = result.output.find("0 of 1 done; " + slow.path() + ": 1 s");
+  EXPECT_NE(progress, std::string::npos) << result.output;
+  // It is gone before the verdict comes.
+  const size_t verdict = result.output.find("\r\x1b[K\x1b[32mTRUSTED JAR", progress);
+  EXPECT_NE(verdict, std::string::npos) << result.output;
+}
+
+TEST(Interruption, EndsTheToolAndTheSimulatorByTheSignal) {
+  const Probe slow({"sign 3 0000", "sleep 60"});
+  const ProcessResult result =
+      InShell("\"$@\" & sleep 1; kill -TERM $!; wait $!", {slow.path()});
+  EXPECT_EQ(result.status, 128 + 15);
 }
 
 TEST(Journal, StartsWithTheVersionTheFileAndTheProcess) {
@@ -129,22 +284,24 @@ TEST(Journal, StartsWithTheVersionTheFileAndTheProcess) {
   const ProcessResult result =
       RunProcess({SimulatorPath(), "--json", "--tool", PROBE_PATH, "./script"}, folder.path());
   std::vector<Json> events = ParseJournal(result.output);
-  ASSERT_EQ(events.size(), 5U);
+  ASSERT_EQ(events.size(), 6U);
   EXPECT_EQ(LinesOf(result.output)[0], "{\"event\":\"journal\",\"version\":1}");
   EXPECT_EQ(events[1], Json({{"event", "start"}, {"file", "./script"}, {"path", file}}));
   EXPECT_GT(events[2]["pid"], 1);
   EXPECT_EQ(events[3]["event"], "sign");
   EXPECT_EQ(LinesOf(result.output)[4], "{\"event\":\"exit\",\"status\":0}");
+  EXPECT_EQ(events[5]["event"], "verdict");
 }
 
 TEST(Journal, IsKeptInAFileAnew) {
   const Probe probe({"sign 3 0000"});
-  const std::string file = probe.folder().Write("journal", ToBytes("from before\n"));
+  const std::string before = "{\"event\":\"journal\",\"version\":1}\n{\"event\":\"old\"}\n";
+  const std::string file = probe.folder().Write("journal", ToBytes(before));
   const ProcessResult kept = Simulated({"--journal", file, probe.path()});
-  EXPECT_EQ(LinesOf(kept.output)[0], "SIGNED " + probe.path() + ": the JAR");
+  EXPECT_EQ(LinesOf(kept.output)[0], "TRUSTED JAR  " + probe.path());
   const ProcessResult both = Simulated({"--json", "--journal", file, probe.path()});
   EXPECT_EQ(ContentOf(file), both.output);
-  EXPECT_EQ(ParseJournal(both.output).size(), 5U);
+  EXPECT_EQ(ParseJournal(both.output).size(), 6U);
 }
 
 TEST(Journal, FileNamesAreBytes) {
@@ -153,7 +310,7 @@ TEST(Journal, FileNamesAreBytes) {
   const ProcessResult result = Simulated({"--json", odd});
   EXPECT_EQ(result.status, 0);
   const std::vector<Json> events = ParseJournal(result.output);
-  ASSERT_EQ(events.size(), 5U);
+  ASSERT_EQ(events.size(), 6U);
   EXPECT_EQ(events[3]["path"], folder / "od\uf7e9\n\"d");
 }
 
@@ -178,9 +335,11 @@ TEST(Simulation, WorksFromAFolderThatTheLoaderCannotName) {
   }
   const Probe probe({"sign 3 0000", "register 3 name ab"});
   const ProcessResult result = RunProcess(
-      {place + "/bin/apktoolkit-sim", "--tool", place + "/bin/simulator_probe", probe.path()});
+      {"env", "LC_ALL=C", place + "/bin/apktoolkit-sim", "--tool", place + "/bin/simulator_probe", probe.path()});
   EXPECT_EQ(result.status, 0) << result.errors;
-  EXPECT_EQ(LinesOf(result.output)[0], "SIGNED " + probe.path() + ": the JAR, 1 key registered");
+  EXPECT_EQ(FirstLines(result, 3),
+            Lines({"TRUSTED JAR  " + probe.path(), "  + JAR  signed, without data",
+                   "  + key  registered for name"}));
 }
 
 TEST(Simulation, RunnerGetsThePreloadForTheTool) {
@@ -236,14 +395,25 @@ TEST(State, LastsForTheFilesOfOneRunWithoutADirectory) {
   EXPECT_EQ(verified[1]["result"], 0);
 }
 
+TEST(State, IsNotSharedWhenSeveralFilesRunAtATime) {
+  const Probe jar({"verify 3", "sign 3 0000"});
+  const ProcessResult result = Simulated({"--jobs", "2", "--json", jar.path(), jar.path()});
+  const std::vector<Json> verified = OfKind(ParseJournal(result.output), "verify");
+  ASSERT_EQ(verified.size(), 2U);
+  EXPECT_EQ(verified[0]["result"], -1);
+  EXPECT_EQ(verified[1]["result"], -1);
+}
+
 TEST(Tool, RunsAsItIsOnAFileThatIsNoZip) {
   const TempDir folder;
   const std::string file = folder.Write("note.txt", ToBytes("hello\n"));
-  const ProcessResult result = RunProcess({SimulatorPath(), file});
+  const ProcessResult result = Told({file});
   EXPECT_EQ(result.status, 1);
   EXPECT_EQ(result.errors, "");
-  EXPECT_EQ(result.output, "REFUSED " + file + ": OpenArchiveFd(3) [file: " + file +
-                               "] returned: -3: Invalid file\n"
+  EXPECT_EQ(result.output, "REFUSED  " + file +
+                               "\n"
+                               "  ✗ file  not signed: it is a text and not an archive\n"
+                               "      Look into it: a failed download leaves its message so.\n"
                                "   1  error      OpenArchiveFd(3) [file: " +
                                file +
                                "] returned: -3: Invalid file\n"

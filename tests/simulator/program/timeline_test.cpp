@@ -10,9 +10,9 @@ namespace {
 
 // A journal's events as a timeline.
 std::string Printed(const std::string& journal, bool colours = false) {
-  const std::vector<Json> events = ParseJournal(journal);
   std::ostringstream out;
-  PrintTimeline("base.apk", events, Judge(events), colours, out);
+  const Look look = {colours, true};
+  PrintTimeline(ParseEvents(journal), "/data/app/base.apk", look, out);
   return out.str();
 }
 
@@ -41,8 +41,7 @@ TEST(Timeline, GoodPackage) {
       R"({"event":"register","fd":3,"path":"/data/app/base.apk","name":"com.app","data":")" +
       kDigest + R"(","result":0}
 )" + kExit;
-  EXPECT_EQ(Printed(journal), R"(SIGNED base.apk: 2 libraries, the package, 1 key registered
-   1  log        VeltSignJni starts: 3.
+  EXPECT_EQ(Printed(journal), R"(   1  log        VeltSignJni starts: 3.
    2  integrity  the tool's own value reads ffffffff, not settled yet (2 times)
    3  integrity  the tool's own value reads 1f
    4  sign       lib/arm64/libfoo.so: signed
@@ -70,8 +69,7 @@ TEST(Timeline, RefusalsStandOut) {
 {"event":"exit","signal":11}
 )";
   const std::string timeline =
-      R"(REFUSED base.apk: the kernel does not trust it (ENOKEY: Required key not available)
-   1  integrity  there is no file for the tool's own value
+      R"(   1  integrity  there is no file for the tool's own value
    2  integrity  the value of task 42 reads zz
    3  verify     base.apk: ENOKEY: Required key not available
    4  sign       : EBADF: Bad file descriptor
@@ -85,7 +83,7 @@ TEST(Timeline, RefusalsStandOut) {
 )";
   EXPECT_EQ(Printed(journal), timeline);
 
-  // In colours, the same without the colours; the verdict and six failures are red.
+  // In colours, the same without the colours; six failures are red.
   std::string coloured = Printed(journal, true);
   int red = 0;
   for (const std::string code : {"\x1b[31m", "\x1b[0m"}) {
@@ -94,43 +92,29 @@ TEST(Timeline, RefusalsStandOut) {
     }
   }
   EXPECT_EQ(coloured, timeline);
-  EXPECT_EQ(red, 2 * 7);
+  EXPECT_EQ(red, 2 * 6);
 }
 
-TEST(Timeline, VerdictOfASignedFileIsGreen) {
-  EXPECT_EQ(LinesOf(Printed(kStart + kSigned + kExit, true))[0],
-            "\x1b[32mSIGNED base.apk: the package\x1b[0m");
-}
-
-TEST(Timeline, JarIsCalledSo) {
+TEST(Timeline, EmptyPayloadIsCalledSo) {
   const std::string journal =
       kStart +
       R"({"event":"sign","fd":3,"path":"/data/app/base.apk","payload":"0000","result":0,"errno":0}
 )" + kExit;
-  EXPECT_EQ(Printed(journal), R"(SIGNED base.apk: the JAR
-   1  sign       base.apk: signed
+  EXPECT_EQ(Printed(journal), R"(   1  sign       base.apk: signed
                  payload: length 0, no data
    2  exit       status 0
 )");
-}
-
-TEST(Timeline, OneIsNotMany) {
-  const std::string journal =
-      kStart + R"({"event":"sign","fd":4,"path":"/a","payload":"0100ab","result":0,"errno":0}
-)" + kSigned +
-      kExit;
-  EXPECT_EQ(LinesOf(Printed(journal))[0], "SIGNED base.apk: 1 library, the package");
 }
 
 TEST(Timeline, NothingIsPrintedThatATerminalWouldObey) {
   const std::string journal =
       kStart + R"({"event":"log","priority":4,"tag":"\u001b[2J","text":"a\u0007\u009b\uf7e9é\nb\n"}
 )" + kExit;
-  EXPECT_EQ(LinesOf(Printed(journal))[1],
+  EXPECT_EQ(LinesOf(Printed(journal))[0],
             "   1  log        [\\x1b[2J] a\\x07\\xc2\\x9b\\xe9é\\x0ab");
 }
 
 TEST(Timeline, UnknownEventIsShownAsItStands) {
-  EXPECT_EQ(LinesOf(Printed(kStart + "{\"event\":\"later\",\"a\":1}\n" + kExit))[1],
+  EXPECT_EQ(LinesOf(Printed(kStart + "{\"event\":\"later\",\"a\":1}\n" + kExit))[0],
             "   1  later      {\"a\":1,\"event\":\"later\"}");
 }

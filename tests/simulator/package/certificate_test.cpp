@@ -1,0 +1,149 @@
+#include "simulator/package/certificate.h"
+
+#include <gtest/gtest.h>
+
+#include "simulator/package/distinguished_name.h"
+#include "support/certificate.h"
+#include "support/files.h"
+#include "support/process.h"
+
+namespace {
+
+std::string_view View(const Bytes& bytes) {
+  return {reinterpret_cast<const char*>(bytes.data()), bytes.size()};
+}
+
+// What a shell command prints of the certificate, which it finds in the file $0.
+std::string Told(const Bytes& certificate, const std::string& command) {
+  const DiskFile file(certificate);
+  const ProcessResult run = RunProcess({"bash", "-o", "pipefail", "-c", command, file.path()});
+  EXPECT_EQ(run.status, 0) << run.errors;
+  std::string text = run.output;
+  while (!text.empty() && text.back() == '\n') text.pop_back();
+  return text;
+}
+
+Certificate Of(const std::string& key) {
+  Certificate certificate;
+  certificate.key = key;
+  return certificate;
+}
+
+}  // namespace
+
+// Each value as openssl and coreutils have it.
+TEST(CertificateFacts, OfAnRsaKey) {
+  const Bytes der = Of("rsa-2048").Build();
+  const auto facts = ParseCertificate(View(der));
+  ASSERT_TRUE(facts.has_value());
+  EXPECT_EQ(facts->sha256, Told(der, "sha256sum <\"$0\" | cut -d' ' -f1"));
+  EXPECT_EQ(facts->key.algorithm, "RSA");
+  EXPECT_EQ(facts->key.bits, 2048);
+  EXPECT_EQ(facts->key.sha256,
+            Told(der, "openssl x509 -inform DER -in \"$0\" -noout -pubkey | openssl pkey -pubin "
+                      "-outform DER | sha256sum | cut -d' ' -f1"));
+  EXPECT_EQ(facts->key.modulus_sha256,
+            Told(der, "openssl x509 -inform DER -in \"$0\" -noout -modulus | sed s/.*=// | "
+                      "basenc --base16 -d | sha256sum | cut -d' ' -f1"));
+  EXPECT_EQ(facts->key.exponent, "\x01" + std::string(1, '\0') + "\x01");  // 65537
+  EXPECT_EQ(facts->signature_algorithm, "SHA256withRSA");
+  EXPECT_EQ(facts->subject, "CN=Test");
+  EXPECT_EQ(facts->issuer, "CN=Test");
+  EXPECT_TRUE(facts->is_self_issued);
+}
+
+TEST(CertificateFacts, OfAnEcKey) {
+  const Bytes der = Of("ec-p256").Build();
+  const auto facts = ParseCertificate(View(der));
+  ASSERT_TRUE(facts.has_value());
+  EXPECT_EQ(facts->key.algorithm, "EC");
+  EXPECT_EQ(facts->key.bits, 256);
+  EXPECT_EQ(facts->key.modulus_sha256, "");
+  EXPECT_EQ(facts->key.exponent, "");
+}
+
+TEST(CertificateFacts, OfAnIssuedCertificate) {
+  Certificate certificate = Of("rsa-2048");
+  certificate.issuer = Name({{"2.5.4.3", "Authority"}});
+  certificate.digest = Digest::kSha1;
+  const Bytes der = certificate.Build();
+  const auto facts = ParseCertificate(View(der));
+  ASSERT_TRUE(facts.has_value());
+  EXPECT_EQ(facts->issuer, "CN=Authority");
+  EXPECT_FALSE(facts->is_self_issued);
+  EXPECT_EQ(facts->signature_algorithm, "SHA1withRSA");
+}
+
+TEST(CertificateFacts, KeyThatDoesNotReadIsNamedByItsAlgorithm) {
+  Certificate certificate = Of("rsa-2048");
+  certificate.public_key_info = PublicKeyInfoAround(ToBytes("no key"));
+  const Bytes der = certificate.Build();
+  const auto facts = ParseCertificate(View(der));
+  ASSERT_TRUE(facts.has_value());
+  EXPECT_EQ(facts->key.algorithm, "RSA");
+  EXPECT_EQ(facts->key.bits, 0);
+  EXPECT_EQ(facts->key.modulus_sha256, "");
+}
+
+TEST(CertificateFacts, CutCertificateHasNone) {
+  const Bytes der = Of("rsa-2048").Build();
+  for (size_t size = 0; size < der.size(); size += 7) {
+    EXPECT_EQ(ParseCertificate(View(Bytes(der.begin(), der.begin() + static_cast<int>(size)))),
+              std::nullopt)
+        << size;
+  }
+}
+
+TEST(CertificateFacts, BytesBehindItDoNotCount) {
+  Bytes der = Of("rsa-2048").Build();
+  const std::string digest = ParseCertificate(View(der))->sha256;
+  der.push_back(0);
+  EXPECT_EQ(ParseCertificate(View(der))->sha256, digest);
+}
+
+// As keytool, which asks the JDK's own class, writes the owner.
+TEST(NameText, IsWhatTheJdkWrites) {
+  const std::vector<Bytes> names = {
+      Name({{"2.5.4.6", "AB"},
+            {"2.5.4.8", "A State"},
+            {"2.5.4.7", "Town"},
+            {"2.5.4.10", "Example, Inc."},
+            {"2.5.4.11", "A + B = \"C\" <D>; #\\"},
+            {"2.5.4.3", " spaces  inside "},
+            {"1.2.840.113549.1.9.1", "a@example.com"},
+            {"0.9.2342.19200300.100.1.25", "example"},
+            {"0.9.2342.19200300.100.1.1", "user"},
+            {"2.5.4.5", "42"},
+            {"2.5.4.4", "Sur"},
+            {"2.5.4.42", "Given"},
+            {"2.5.4.12", "Title"},
+            {"2.5.4.9", "Street"},
+            {"1.2.3.4", "own"}}),
+      Name({{"2.5.4.3", "Gr\u00fc\u00dfe \u4e2d"}}),
+      Name({{"2.5.4.3", "\"quoted\""}, {"2.5.4.10", ""}}),
+      der::Sequence({der::Set({der::Sequence({der::Oid("2.5.4.3"), der::Integer(5)})})}),
+      der::Sequence({der::Set({der::Sequence({der::Oid("2.5.4.3"), der::Element(0x0c, "one")}),
+                               der::Sequence({der::Oid("2.5.4.10"), der::Element(0x0c, "two")})})}),
+      der::Sequence({der::Set(
+          {der::Sequence({der::Oid("2.5.4.3"), der::Element(0x1e, FromHex("004100e94e2d"))})})}),
+      der::Sequence(
+          {der::Set({der::Sequence({der::Oid("2.5.4.3"), der::Element(0x14, "caf\xe9")})})}),
+  };
+  const TempDir folder;
+  std::string command = "cd \"$0\"; for i in *; do LC_ALL=C.UTF-8 keytool -J-Dfile.encoding=UTF-8 "
+                        "-J-Dstdout.encoding=UTF-8 -printcert -file $i | sed -n 's/^Owner: //p'; "
+                        "done";
+  std::string expected;
+  for (size_t i = 0; i < names.size(); ++i) {
+    Certificate certificate;
+    certificate.subject = names[i];
+    folder.Write(std::to_string(i), certificate.Build());
+    expected += NameText(View(names[i])) + "\n";
+  }
+  EXPECT_EQ(RunProcess({"bash", "-c", command, folder.path()}).output, expected);
+}
+
+TEST(NameText, IsEmptyOfWhatIsNoName) {
+  EXPECT_EQ(NameText(""), "");
+  EXPECT_EQ(NameText("CN=Test"), "");
+}

@@ -1,0 +1,123 @@
+#include "simulator/package/signing_block.h"
+
+#include <gtest/gtest.h>
+
+#include "simulator/package/archive_end.h"
+#include "support/newer_signers.h"
+#include "support/files.h"
+#include "support/zip.h"
+
+namespace {
+
+std::string_view View(const Bytes& bytes) {
+  return {reinterpret_cast<const char*>(bytes.data()), bytes.size()};
+}
+
+// "scheme certificate" for each signer, and "damaged" where the block is.
+std::vector<std::string> Read(const Bytes& block) {
+  const SigningBlock parsed = ParseSigningBlock(View(block));
+  std::vector<std::string> lines;
+  for (const NewerSigner& signer : parsed.signers) {
+    lines.push_back(std::string(signer.scheme) + " " + std::string(signer.certificate));
+  }
+  if (parsed.is_damaged) lines.emplace_back("damaged");
+  return lines;
+}
+
+using Lines = std::vector<std::string>;
+
+const Bytes kSigner = SignerBytes(ToBytes("CERT"));
+
+}  // namespace
+
+TEST(SigningBlock, EachSchemeHasItsSigners) {
+  const Bytes block = SigningBlockBytes({{kSchemeV2, Signers({kSigner})},
+                                         {0x42726577, Bytes(4000, 0)},  // padding
+                                         {kSchemeV3, Signers({SignerBytes(ToBytes("A")),
+                                                              SignerBytes(ToBytes("B"))})},
+                                         {kSchemeV31, Signers({kSigner})}});
+  EXPECT_EQ(Read(block), Lines({"v2 CERT", "v3 A", "v3 B", "v3.1 CERT"}));
+}
+
+TEST(SigningBlock, NothingIsNoBlock) { EXPECT_EQ(Read({}), Lines()); }
+
+TEST(SigningBlock, WithoutAKnownSchemeHasNoSigners) {
+  EXPECT_EQ(Read(SigningBlockBytes({{7, ToBytes("whatever")}})), Lines());
+  EXPECT_EQ(Read(SigningBlockBytes({})), Lines());
+}
+
+TEST(SigningBlock, DamageKeepsTheSignersBeforeIt) {
+  const Bytes good = Signers({kSigner});
+  Bytes cut = good;
+  cut.pop_back();
+  EXPECT_EQ(Read(SigningBlockBytes({{kSchemeV2, good}, {kSchemeV3, cut}})),
+            Lines({"v2 CERT", "damaged"}));
+  EXPECT_EQ(Read(SigningBlockBytes({{kSchemeV2, {}}})), Lines({"damaged"}));
+  EXPECT_EQ(Read(Bytes(31, 0)), Lines({"damaged"}));
+}
+
+// A length that runs out of what it is in, at every depth.
+TEST(SigningBlock, LengthsThatReachTooFarAreDamage) {
+  const Bytes whole = Signers({kSigner});
+  for (size_t field : {0, 4, 8, 12, 16, 20}) {
+    Bytes value = whole;
+    value[field + 3] = 0x7f;
+    EXPECT_EQ(Read(SigningBlockBytes({{kSchemeV2, value}})), Lines({"damaged"})) << field;
+  }
+  Bytes block = SigningBlockBytes({{kSchemeV2, whole}});
+  block[8 + 7] = 0xff;  // the pair's own length
+  EXPECT_EQ(Read(block), Lines({"damaged"}));
+}
+
+TEST(SigningBlock, SignersBeyondReasonAreNotRead) {
+  const std::vector<Bytes> many(17, kSigner);
+  EXPECT_EQ(Read(SigningBlockBytes({{kSchemeV2, Signers(many)}})).size(), 17U);
+  EXPECT_EQ(Read(SigningBlockBytes({{kSchemeV2, Signers(many)}})).back(), "damaged");
+}
+
+namespace {
+
+// What is read of an archive with this in front of its central directory.
+std::string ReadFrom(const Bytes& block, const std::string& comment = "") {
+  const MemoryFile file(ArchiveWithBlock(BuildZip({{"a", ToBytes("data")}}), block, comment));
+  return ReadSigningBlock(file.fd());
+}
+
+}  // namespace
+
+TEST(ReadSigningBlock, FindsItBeforeTheCentralDirectory) {
+  const Bytes block = SigningBlockBytes({{kSchemeV2, Signers({kSigner})}});
+  EXPECT_EQ(ReadFrom(block), View(block));
+  EXPECT_EQ(ReadFrom(block, "a comment with PK in it"), View(block));
+}
+
+TEST(ReadSigningBlock, ThereIsNoneWithoutMagicOrRoom) {
+  Bytes block = SigningBlockBytes({{kSchemeV2, Signers({kSigner})}});
+  EXPECT_EQ(ReadFrom({}), "");
+  Bytes other = block;
+  other.back() = '3';
+  EXPECT_EQ(ReadFrom(other), "");
+  Bytes too_long = block;
+  too_long[too_long.size() - 18] = 0x7f;  // its size, in the footer
+  EXPECT_EQ(ReadFrom(too_long), "");
+  Bytes too_short = block;
+  for (size_t i = 0; i < 8; ++i) too_short[too_short.size() - 24 + i] = 0;
+  EXPECT_EQ(ReadFrom(too_short), "");
+}
+
+TEST(ReadSigningBlock, ThereIsNoneWithoutAnArchive) {
+  const MemoryFile empty({});
+  EXPECT_EQ(ReadSigningBlock(empty.fd()), "");
+  const MemoryFile text(ToBytes("no archive, but long enough to hold the record of an end"));
+  EXPECT_EQ(ReadSigningBlock(text.fd()), "");
+  EXPECT_EQ(ReadSigningBlock(-1), "");
+}
+
+TEST(ArchiveEnd, MayLieAboutItsDirectory) {
+  Bytes zip = BuildZip({{"a", ToBytes("data")}});
+  zip[zip.size() - 22 + 19] = 0xff;  // the highest byte of the directory's offset
+  const MemoryFile file(zip);
+  ASSERT_TRUE(FindArchiveEnd(file.fd()).has_value());
+  EXPECT_GT(FindArchiveEnd(file.fd())->directory_offset, zip.size());
+  EXPECT_EQ(ReadSigningBlock(file.fd()), "");
+}
