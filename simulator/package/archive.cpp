@@ -41,8 +41,9 @@ std::vector<ArchiveEntry> Archive::Entries(std::string_view prefix, std::string_
 }
 
 bool Archive::Has(const std::string& name) const {
+  constexpr int32_t kEntryNotFound = -7;  // which the library's header does not name
   ZipEntry entry;
-  return name.size() <= UINT16_MAX && FindEntry(handle_, name, &entry) == 0;
+  return name.size() <= UINT16_MAX && FindEntry(handle_, name, &entry) != kEntryNotFound;
 }
 
 std::optional<std::string> Archive::Read(const std::string& name, uint64_t most) const {

@@ -32,6 +32,7 @@ class Archive {
   std::vector<ArchiveEntry> Entries(std::string_view prefix = "",
                                     std::string_view suffix = "") const;
 
+  // Whether there is an entry of this name, be it one that cannot be extracted.
   bool Has(const std::string& name) const;
   // The whole entry; none when there is no such entry, when it cannot be extracted, or when it is
   // longer than `most`.

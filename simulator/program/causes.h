@@ -245,10 +245,12 @@ inline constexpr Cause kOtherKey = {
     "other-key",
     "%s is of another key than the JAR signature: phones install the package for that key, and the "
     "kernel gets this one",
-    "Sign it once, with one key for all schemes. If it is not of your making: do not trust it."};
+    "Sign it with one key for all schemes; a rotated key reaches the newer ones alone. If it is not "
+    "of your making: do not trust it."};
 inline constexpr Cause kSchemesStripped = {
     "schemes-stripped",
-    "the signature file says that scheme %s was there, and it is not: phones do not install this",
+    "the signature file says that the package is signed with %s as well, and it is not: phones do "
+    "not install it",
     "Sign the package again, as the last step that changes it."};
 inline constexpr Cause kSigningBlockDamaged = {
     "signing-block-damaged", "the block of the schemes after v1 does not read",

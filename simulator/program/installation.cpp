@@ -76,6 +76,7 @@ std::optional<std::string> Installation::LayOut(const std::string& file, Install
 
   std::error_code error;
   std::string folder = fs::temp_directory_path(error).string() + "/apktoolkit-sim.XXXXXX";
+  if (error) return error.message();
   if (mkdtemp(folder.data()) == nullptr) return folder + ": " + strerrordesc_np(errno);
   folder_ = fs::canonical(folder, error).string();
   const std::string copy = folder_ + "/" + FileName(file);

@@ -27,6 +27,8 @@ std::string FolderOf(const std::string& path);
 
 void AddLibraryItems(const RunRecord& run, const PackageFacts& facts, const Item& own,
                      bool is_strict, std::vector<Item>* items) {
+  // A JAR's entries are nobody's libraries.
+  if (own.kind != ItemKind::kPackage) return;
   const bool is_walked = own.state == ItemState::kDone || run.own || !run.libraries.empty();
   for (const Library& library : MatchAttempts(run, facts)) {
     if (library.place.empty()) {

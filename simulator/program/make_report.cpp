@@ -91,6 +91,7 @@ Item OwnItem(const RunRecord& run, const PackageFacts& facts) {
   const char* const name = kind == ItemKind::kPackage ? "package"
                            : kind == ItemKind::kJar   ? "JAR"
                                                       : "file";
+  if (run.verify_error.value_or(0) != 0) return Refused(kind, name, WhyJarRefused(run));
   if (run.own) {
     const Reason reason = WhyKernelDidNotSign(*run.own);
     const ItemState state = reason.cause == nullptr ? ItemState::kDone : ItemState::kRefused;

@@ -11,8 +11,8 @@
 namespace {
 
 constexpr char kDescription[] =
-    "Runs apktoolkit, as it is, for each FILE inside a simulated phone, and tells what\n"
-    "the phone accepted of it, why not the rest, and what to change.";
+    "Runs apktoolkit, as it is, for each FILE inside a simulated phone, and tells\n"
+    "what the phone accepted of it, why not the rest, and what to change.";
 
 constexpr char kFooter[] =
     "Exit status, the highest of all FILEs:\n"
@@ -204,7 +204,8 @@ void AddRun(CLI::App* app, Options* options, std::string* runner) {
 
 // What begins with "-" and is no option may have been meant for a file.
 std::optional<int> NameUnknownOption(const CLI::App& app) {
-  const std::vector<std::string> unknown = app.remaining();
+  std::vector<std::string> unknown = app.remaining();
+  unknown.erase(std::remove(unknown.begin(), unknown.end(), "--"), unknown.end());
   if (unknown.empty()) return {};
   std::cerr << "there is no option " << unknown[0] << " (a file of that name: ./" << unknown[0]
             << ")\nRun with --help for more information.\n";

@@ -40,13 +40,22 @@ std::vector<Reason> FindWarnings(const PackageFacts& facts, const Item& own,
 
 namespace {
 
+// One warning for a scheme that the JAR signer has no part in.
 void WarnOfOtherKeys(const PackageFacts& facts, std::vector<Reason>* warnings) {
-  for (const NewerSignerFacts& signer : facts.newer) {
-    if (signer.certificate.key.sha256 == facts.jar.certificate->key.sha256) continue;
-    warnings->push_back(
-        {&cause::kOtherKey, "the " + signer.scheme + " signature (" + signer.certificate.subject +
-                                ", public key SHA-256 digest: " + signer.certificate.key.sha256 +
-                                ")"});
+  const std::string& key = facts.jar.certificate->key.sha256;
+  for (const std::string& scheme : NewerSchemes(facts)) {
+    const NewerSignerFacts* other = nullptr;
+    bool has_key = false;
+    for (const NewerSignerFacts& signer : facts.newer) {
+      if (signer.scheme != scheme) continue;
+      has_key = has_key || signer.certificate.key.sha256 == key;
+      if (other == nullptr) other = &signer;
+    }
+    if (has_key) continue;
+    warnings->push_back({&cause::kOtherKey, "the " + scheme + " signature (" +
+                                                other->certificate.subject +
+                                                ", public key SHA-256 digest: " +
+                                                other->certificate.key.sha256 + ")"});
   }
 }
 

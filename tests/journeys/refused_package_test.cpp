@@ -7,6 +7,7 @@
 
 #include "support/expected_timeline.h"
 #include "support/files.h"
+#include "support/namespaces.h"
 #include "support/package.h"
 #include "support/simulation.h"
 
@@ -230,6 +231,7 @@ TEST_F(IncompletePackage, LibraryThatIsAPipeOnDiskIsRefused) {
 
 // In a user namespace of its own the tool has no right to another user's files, not even as root.
 TEST_F(IncompletePackage, LibraryThatMayNotBeReadIsRefused) {
+  if (!CanMakeNamespaces()) GTEST_SKIP() << kNoNamespaces;
   std::filesystem::permissions(library_, std::filesystem::perms::none);
   package_.WriteTo(apk_);
 

@@ -14,10 +14,14 @@ make_unsigned_package() {
   compile_library aarch64-linux-android27 "$work/lib/arm64-v8a/libvault.so"
   compile_library armv7a-linux-androideabi27 "$work/lib/armeabi-v7a/libvault.so"
   smali assemble --api 27 -o "$work/classes.dex" "$sources/Vault.smali"
-  aapt package -f -M "$sources/AndroidManifest.xml" -F "$apk" \
-    -I /usr/share/android-framework-res/framework-res.apk
+  put_android_manifest "$apk" "$sources/AndroidManifest.xml"
   put_entries "$apk" "$work" classes.dex lib/{arm64-v8a,armeabi-v7a}/libvault.so
   rm -r "$work"
+}
+
+# put_android_manifest APK MANIFEST: makes the package anew, of this manifest compiled and nothing else.
+put_android_manifest() {
+  aapt package -f -M "$2" -F "$1" -I /usr/share/android-framework-res/framework-res.apk
 }
 
 compile_library() {  # TARGET LIBRARY

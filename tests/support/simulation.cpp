@@ -46,6 +46,19 @@ Simulation Simulate(const std::string& file, const std::vector<std::string>& opt
   return {run.status, TimelineOf(run.output)};
 }
 
+std::vector<std::string> FirstLines(size_t count, const std::vector<std::string>& words,
+                                    const Start& start) {
+  std::vector<std::string> command = start.before;
+  command.insert(command.end(), {"env", "LC_ALL=C.UTF-8", SimulatorPath()});
+  command.insert(command.end(), words.begin(), words.end());
+  const ProcessResult run = RunProcess(command, start.directory);
+  std::vector<std::string> lines;
+  std::istringstream text(run.output);
+  for (std::string line; lines.size() < count && std::getline(text, line);) lines.push_back(line);
+  lines.push_back("-> " + std::to_string(run.status));
+  return lines;
+}
+
 bool AreProgramsEmulated() { return *APKTOOLKIT_RUNNER != '\0'; }
 
 std::string ToolPath() { return APKTOOLKIT_PATH; }

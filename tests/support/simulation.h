@@ -21,6 +21,11 @@ struct Start {
 Simulation Simulate(const std::string& file, const std::vector<std::string>& options,
                     const Start& start);
 
+// The first lines that a person sees who reads UTF-8 and runs the simulator with these words in the
+// folder `directory`; and its exit status, as a last line "-> STATUS".
+std::vector<std::string> FirstLines(size_t count, const std::vector<std::string>& words,
+                                    const Start& start);
+
 // Whether the built programs are for another processor and run under an emulator, which answers
 // some questions in the kernel's place.
 bool AreProgramsEmulated();

@@ -122,8 +122,8 @@ TEST(ReportText, WarningsStandOut) {
   report.warnings = {{&cause::kSchemesStripped, "v2"}};
   EXPECT_EQ(Printed(report, {true, true}),
             "\x1b[33mPARTLY SIGNED\x1b[0m  base.apk   com.example.vault\n"
-            "\x1b[33m  ! the signature file says that scheme v2 was there, and it is not: phones "
-            "do not install this\x1b[0m\n"
+            "\x1b[33m  ! the signature file says that the package is signed with v2 as well, and it "
+            "is not: phones do not install it\x1b[0m\n"
             "      Sign the package again, as the last step that changes it.\n");
 }
 

@@ -1,0 +1,347 @@
+// Why a package is refused, as the person sees it who brings it: real packages, made by the tools
+// that developers make them with, and the first lines of what they are told.
+#include <gtest/gtest.h>
+#include <sys/stat.h>
+#include <unistd.h>
+
+#include <filesystem>
+
+#include "support/files.h"
+#include "support/namespaces.h"
+#include "support/process.h"
+#include "support/simulation.h"
+
+namespace {
+
+namespace fs = std::filesystem;
+using Lines = std::vector<std::string>;
+
+// The packages' verdict lines after the word and the file, by their signers.
+constexpr char kVault[] = "   com.example.vault";
+constexpr char kSigned[] = "  ✓ package                signed with the payload of that key";
+
+std::string By(const std::string& subject, const std::string& key) {
+  return std::string(kVault) + "   signer CN=" + subject + ", O=Example, " + key;
+}
+
+std::string ByRsa2048() { return By("rsa-2048", "RSA-2048, key 98302ce8…f64646"); }
+
+// A copy of a golden package with its libraries beside it, for a test to spoil.
+class Reason : public testing::Test {
+ protected:
+  // `name` is a folder of make_golden_packages, or a package in it.
+  void Take(const std::string& name) {
+    const fs::path source = fs::path(GOLDEN_PACKAGES) / name;
+    if (fs::is_directory(source)) {
+      fs::copy(source, folder_.path(), fs::copy_options::recursive);
+    } else {
+      fs::copy_file(source, folder_ / "base.apk");
+    }
+  }
+
+  // A shell command in the package's folder.
+  void Do(const std::string& command) const {
+    const ProcessResult run = RunProcess({"bash", "-e", "-c", command}, folder_.path());
+    ASSERT_EQ(run.status, 0) << run.errors;
+  }
+
+  Lines Told(size_t lines, const Lines& options = {}, const std::string& file = "base.apk",
+             const Lines& before = {}) const {
+    Lines words = options;
+    words.push_back(file);
+    return FirstLines(lines, words, {before, folder_.path()});
+  }
+
+  const TempDir folder_;
+};
+
+TEST_F(Reason, Unsigned) {
+  Take("unsigned.apk");
+  EXPECT_EQ(Told(3), Lines({std::string("REFUSED  base.apk") + kVault,
+                            "  ✗ package                not signed: it is unsigned: "
+                            "META-INF/MANIFEST.MF is missing",
+                            "      Sign it: apksigner sign --v1-signing-enabled true.", "-> 1"}));
+}
+
+TEST_F(Reason, NewerSchemeOnly) {
+  Take("apksigner-newer-only");
+  EXPECT_EQ(Told(4),
+            Lines({std::string("REFUSED  base.apk") + kVault,
+                   "  ✗ package                not signed: it is signed with v2, v3 alone, and "
+                   "this tool reads JAR signatures (v1): META-INF/MANIFEST.MF is missing",
+                   "      Sign it with v1 as well: enableV1Signing true for the Gradle plugin, or",
+                   "      apksigner sign --v1-signing-enabled true --min-sdk-version 23.",
+                   "-> 1"}));
+}
+
+TEST_F(Reason, SignedByJarsigner) {
+  for (const char* name : {"jarsigner-sha256", "jarsigner-sha1"}) {
+    const Lines told = FirstLines(3, {"base.apk"}, {{}, std::string(GOLDEN_PACKAGES) + "/" + name});
+    EXPECT_EQ(told, Lines({"REFUSED  base.apk" + ByRsa2048(),
+                           "  ✗ package                not signed: its signature covers signed "
+                           "attributes, as jarsigner writes them, and this tool does not read "
+                           "those",
+                           "      Sign it with apksigner; no option of jarsigner helps.", "-> 1"}));
+  }
+}
+
+TEST_F(Reason, CertificateThatAnAuthorityIssued) {
+  Take("openssl-cms-issued");
+  EXPECT_EQ(Told(3), Lines({"REFUSED  base.apk" +
+                                By("rsa-2048-other", "RSA-2048, key 03e5e653…57c52a"),
+                            "  ✗ package                not signed: its certificate was issued by "
+                            "another (CN=rsa-2048, O=Example), and this tool takes self-signed "
+                            "ones alone",
+                            "      Sign it with a self-signed certificate, which keytool "
+                            "-genkeypair makes.",
+                            "-> 1"}));
+}
+
+TEST_F(Reason, EcKey) {
+  Take("apksigner-ec");
+  EXPECT_EQ(Told(3), Lines({"REFUSED  base.apk" + By("ec-p256", "EC-256"),
+                            "  ✗ package                not signed: its key is an EC key, and this "
+                            "tool knows RSA alone",
+                            "      Sign it with an RSA key of 2048 to 4096 bits.", "-> 1"}));
+}
+
+TEST_F(Reason, KeyOfMoreThan4096Bits) {
+  Take("apksigner-5120");
+  EXPECT_EQ(Told(3), Lines({"REFUSED  base.apk" + By("rsa-5120", "RSA-5120, key 255bfb8f…6e1f99"),
+                            "  ✗ package                not signed: its RSA key has 5120 bits, and "
+                            "this tool takes at most 4096",
+                            "      Sign it with an RSA key of 2048 to 4096 bits.", "-> 1"}));
+}
+
+// keytool signs the certificate of a larger key with SHA-384 by itself; what the cure says helps.
+TEST_F(Reason, CertificateSignedWithALongerDigest) {
+  Take("keytool-sha384");
+  const Lines told = Told(5);
+  EXPECT_EQ(Lines(told.begin() + 1, told.end()),
+            Lines({"  ✗ package                not signed: its certificate is signed with "
+                   "SHA384withRSA, and this tool reads MD5, SHA-1 and SHA-256 with RSA",
+                   "      Make a certificate for the same key with SHA-256: keytool -selfcert",
+                   "      -sigalg SHA256withRSA. keytool takes SHA-384 by itself for keys of more",
+                   "      than 3072 bits.", "-> 1"}));
+  EXPECT_EQ(FirstLines(0, {"base.apk"}, {{}, std::string(GOLDEN_PACKAGES) + "/keytool-sha256"}),
+            Lines({"-> 0"}));
+}
+
+TEST_F(Reason, SignatureOverALongerDigest) {
+  Take("openssl-cms-sha512");
+  EXPECT_EQ(Told(2)[1],
+            "  ✗ package                not signed: it is signed over SHA-512, and this tool reads "
+            "MD5, SHA-1 and SHA-256");
+}
+
+TEST_F(Reason, Folder) {
+  EXPECT_EQ(Told(3, {}, "."), Lines({"REFUSED  .", "  ✗ file  not signed: it is a folder",
+                                     "      Name the package inside it, such as base.apk.",
+                                     "-> 1"}));
+}
+
+TEST_F(Reason, EmptyFile) {
+  folder_.Write("base.apk", {});
+  EXPECT_EQ(Told(2), Lines({"REFUSED  base.apk",
+                            "  ✗ file  not signed: it is empty, a file of 0 bytes", "-> 1"}));
+}
+
+TEST_F(Reason, CutFile) {
+  Take("apksigner-sha256-2048");
+  Do("truncate -s 5000 base.apk");
+  EXPECT_EQ(Told(2), Lines({"REFUSED  base.apk",
+                            "  ✗ file  not signed: it begins like an archive and has no end: it "
+                            "was cut off",
+                            "-> 1"}));
+  // The zip library's own words are part of the timeline.
+  EXPECT_EQ(Told(4)[3], "   1  log        [ziparchive] Zip: EOCD not found, " +
+                            (folder_ / "base.apk") + " is not zip");
+}
+
+TEST_F(Reason, TextFile) {
+  folder_.Write("base.apk", ToBytes("<html>404 Not Found</html>\n"));
+  EXPECT_EQ(Told(2), Lines({"REFUSED  base.apk",
+                            "  ✗ file  not signed: it is a text and not an archive", "-> 1"}));
+}
+
+TEST_F(Reason, DamagedArchive) {
+  Take("apksigner-sha256-2048");
+  // Of the end record, the directory's offset.
+  Do("printf '\\xff' | dd of=base.apk bs=1 conv=notrunc status=none "
+     "seek=$(($(stat -c %s base.apk) - 3))");
+  EXPECT_EQ(Told(2)[1],
+            "  ✗ file  not signed: it is a damaged archive, which the zip library does not open");
+}
+
+TEST_F(Reason, IntegrityValueZero) {
+  Take("apksigner-sha256-2048");
+  EXPECT_EQ(Told(8, {"--integrity", "0"}),
+            Lines({"REFUSED  base.apk" + ByRsa2048(),
+                   "  ✗ package                not signed: the tool's own integrity value settled "
+                   "at 0, so that it may not sign",
+                   "  ✗ lib/arm64/libvault.so  not signed: the tool's own integrity value settled "
+                   "at 0, so that it may not sign",
+                   "  ✗ lib/arm/libvault.so    not signed: the tool's own integrity value settled "
+                   "at 0, so that it may not sign",
+                   "      The file was good. Look at the domain that the tool is started from: its",
+                   "      value is to be neither 0 nor ffffffff.",
+                   "  ✓ key                    registered for com.example.vault", "  signer",
+                   "-> 1"}));
+}
+
+TEST_F(Reason, KernelThatRefuses) {
+  Take("apksigner-sha256-2048");
+  EXPECT_EQ(Told(2, {"--sign-errno", "EPERM"})[1],
+            "  ✗ package                not signed: the kernel refused (EPERM: Operation not "
+            "permitted)");
+}
+
+TEST_F(Reason, MissingFile) {
+  EXPECT_EQ(Told(2), Lines({"NOT LOOKED AT  base.apk",
+                            "  ✗ file  not looked at: there is no such file", "-> 4"}));
+}
+
+TEST_F(Reason, NoPermission) {
+  if (!CanMakeNamespaces()) GTEST_SKIP() << kNoNamespaces;
+  Take("apksigner-sha256-2048");
+  fs::permissions(folder_ / "base.apk", fs::perms::none);
+  EXPECT_EQ(Told(2, {}, "base.apk", {"unshare", "-U"}),
+            Lines({"NOT LOOKED AT  base.apk", "  ✗ file  not looked at: it may not be read",
+                   "-> 4"}));
+}
+
+TEST_F(Reason, ReadOnlyFileSystem) {
+  if (!CanMakeNamespaces()) GTEST_SKIP() << kNoNamespaces;
+  Take("apksigner-sha256-2048");
+  const TempDir mount_point;
+  const std::string apk = mount_point / "base.apk";
+  const Lines before = OnItsOwnFileSystem(folder_ / "base.apk", mount_point.path(), "ro");
+  EXPECT_EQ(Told(2, {}, apk, before),
+            Lines({"NOT LOOKED AT  " + apk,
+                   "  ✗ file  not looked at: it lies on a read-only file system, where the tool "
+                   "leaves every file alone",
+                   "-> 4"}));
+}
+
+TEST_F(Reason, ClosedStandardInput) {
+  Take("apksigner-sha256-2048");
+  EXPECT_EQ(Told(2, {}, "base.apk", {"bash", "-c", "exec \"$0\" \"$@\" <&-"}),
+            Lines({"NOT LOOKED AT  base.apk",
+                   "  ✗ file  not looked at: standard input is closed, so the file got its place, "
+                   "descriptor 0, which the tool takes for a failure",
+                   "-> 4"}));
+}
+
+TEST_F(Reason, TamperedLibrary) {
+  Take("apksigner-sha256-2048");
+  Do("echo >>lib/arm64/libvault.so");
+  EXPECT_EQ(Told(7),
+            Lines({"PARTLY SIGNED  base.apk" + ByRsa2048(), kSigned,
+                   "  ✗ lib/arm64/libvault.so  not signed: its bytes are not those that the "
+                   "manifest lists",
+                   "      The file beside the package was changed after it was installed. Install",
+                   "      the package again.", "  ✓ lib/arm/libvault.so    signed",
+                   "  ✓ key                    registered for com.example.vault", "-> 1"}));
+}
+
+TEST_F(Reason, TamperedDexFile) {
+  Take("changed-dex");
+  EXPECT_EQ(Told(7),
+            Lines({"REFUSED  base.apk" + ByRsa2048(),
+                   "  ✗ package                not signed: classes.dex is not the one that was "
+                   "signed",
+                   "      Sign the package again, as the last step that changes it. If nobody",
+                   "      changed it: do not trust it.",
+                   "  ✗ lib/arm64/libvault.so  not signed: the package is refused",
+                   "  ✗ lib/arm/libvault.so    not signed: the package is refused",
+                   "  ✗ key                    not registered: the package is refused", "-> 1"}));
+}
+
+TEST_F(Reason, TamperedManifest) {
+  Take("apksigner-sha256-2048");
+  Do("unzip -q base.apk META-INF/MANIFEST.MF; echo >>META-INF/MANIFEST.MF;"
+     " zip -q base.apk META-INF/MANIFEST.MF");
+  EXPECT_EQ(Told(3),
+            Lines({"REFUSED  base.apk" + ByRsa2048(),
+                   "  ✗ package                not signed: META-INF/MANIFEST.MF was changed after "
+                   "it was signed",
+                   "      Sign the package again, as the last step that changes it.", "-> 1"}));
+}
+
+TEST_F(Reason, TamperedSignatureFile) {
+  Take("apksigner-sha256-2048");
+  Do("unzip -q base.apk META-INF/CERT.SF; echo >>META-INF/CERT.SF;"
+     " zip -q base.apk META-INF/CERT.SF");
+  EXPECT_EQ(Told(2)[1],
+            "  ✗ package                not signed: its signature file META-INF/CERT.SF was changed "
+            "after it was signed");
+}
+
+TEST_F(Reason, SignatureThatWasTakenOut) {
+  Take("apksigner-sha256-2048");
+  Do("zip -q -d base.apk META-INF/CERT.RSA");
+  EXPECT_EQ(Told(2)[1],
+            "  ✗ package                not signed: the block META-INF/CERT.RSA, which belongs to "
+            "its signature file, is missing");
+  Do("zip -q -d base.apk META-INF/CERT.SF");
+  EXPECT_EQ(Told(2)[1],
+            "  ✗ package                not signed: there is no signature file: no entry "
+            "META-INF/*.SF, in capitals");
+}
+
+// The package alone, as a store delivers it.
+TEST_F(Reason, LibrariesThatDoNotLieBesideThePackage) {
+  Take("apksigner-sha256-2048");
+  Do("rm -r lib");
+  const std::string absent =
+      "nothing to sign: no libraries for its processor lie beside the package";
+  EXPECT_EQ(Told(7),
+            Lines({"SIGNED  base.apk" + ByRsa2048(), kSigned,
+                   "  – lib/arm64/libvault.so  " + absent, "  – lib/arm/libvault.so    " + absent,
+                   "      Nothing, where the phone is of another kind. For a package that lies",
+                   "      alone: --install.",
+                   "  ✓ key                    registered for com.example.vault", "-> 0"}));
+  EXPECT_EQ(Told(1, {"--strict"}), Lines({"PARTLY SIGNED  base.apk" + ByRsa2048(), "-> 1"}));
+  EXPECT_EQ(Told(5, {"--install=all"}),
+            Lines({"SIGNED  base.apk" + ByRsa2048(), kSigned, "  ✓ lib/arm64/libvault.so  signed",
+                   "  ✓ lib/arm/libvault.so    signed",
+                   "  ✓ key                    registered for com.example.vault", "-> 0"}));
+  EXPECT_EQ(Told(4, {"--install"})[2], "  ✓ lib/arm64/libvault.so  signed");
+  EXPECT_EQ(Told(4, {"--install"})[3], "  – lib/arm/libvault.so    " + absent);
+}
+
+TEST_F(Reason, LibraryOfOneProcessorThatWasNotInstalled) {
+  Take("apksigner-sha256-2048");
+  Do("rm -r lib/arm");
+  EXPECT_EQ(Told(4)[2], "  ✓ lib/arm64/libvault.so  signed");
+  EXPECT_EQ(Told(4)[3],
+            "  – lib/arm/libvault.so    nothing to sign: no libraries for its processor lie beside "
+            "the package");
+}
+
+TEST_F(Reason, LibrariesThatThePackageKeeps) {
+  Take("kept-libraries");
+  Do("rm -r lib");
+  const std::string kept =
+      "nothing to sign: it stays inside the package (extractNativeLibs=\"false\")";
+  EXPECT_EQ(Told(6),
+            Lines({"SIGNED  base.apk" + ByRsa2048(),
+                   "  ✓ package                 signed with the payload of that key",
+                   "  – lib/arm64/libvault.so   " + kept, "  – lib/arm/libvault.so     " + kept,
+                   "      Nothing: it is loaded from the package.",
+                   "  – lib/x86_64/libvault.so  nothing to sign: no phone of this kind installs it",
+                   "-> 0"}));
+}
+
+TEST_F(Reason, Jar) {
+  Do("echo text >a.txt; jar --create --file library.jar a.txt");
+  EXPECT_EQ(Told(2, {}, "library.jar"),
+            Lines({"NOT TRUSTED JAR  library.jar",
+                   "  ✗ JAR  not signed: it is a plain JAR, and those are signed only when the "
+                   "kernel trusts them already (ENOKEY: Required key not available)",
+                   "-> 1"}));
+  EXPECT_EQ(Told(2, {"--trust", "library.jar"}, "library.jar"),
+            Lines({"TRUSTED JAR  library.jar", "  ✓ JAR  signed, without data", "-> 0"}));
+}
+
+}  // namespace

@@ -1,0 +1,117 @@
+// Who signed, in the words of the tool that people compare with, and what is doubtful about it.
+#include <gtest/gtest.h>
+
+#include <algorithm>
+#include <sstream>
+
+#include "support/process.h"
+#include "support/simulation.h"
+
+namespace {
+
+using Lines = std::vector<std::string>;
+
+std::string Golden(const std::string& name) { return std::string(GOLDEN_PACKAGES) + "/" + name; }
+
+// Those lines of a command's output that have one of the labels, from the label on.
+Lines Labelled(const std::string& output) {
+  const Lines labels = {"certificate DN: ", "certificate SHA-256 digest: ", "key algorithm: ",
+                        "key size (bits): ", "public key SHA-256 digest: "};
+  Lines lines;
+  std::istringstream text(output);
+  for (std::string line; std::getline(text, line);) {
+    for (const std::string& label : labels) {
+      const size_t at = line.find(label);
+      if (at != std::string::npos) lines.push_back(line.substr(at));
+    }
+  }
+  return lines;
+}
+
+class Signer : public testing::TestWithParam<const char*> {};
+
+TEST_P(Signer, IsPrintedAsApksignerPrintsIt) {
+  const std::string apk = Golden(GetParam()) + "/base.apk";
+  const ProcessResult judge =
+      RunProcess({"env", "LC_ALL=C.UTF-8", "apksigner", "verify", "--print-certs", "-v", apk});
+  ASSERT_EQ(judge.status, 0) << judge.errors;
+  const ProcessResult told = RunProcess({"env", "LC_ALL=C.UTF-8", SimulatorPath(), apk});
+
+  const Lines expected = Labelled(judge.output);
+  ASSERT_EQ(expected.size(), 5U) << judge.output;
+  EXPECT_EQ(Labelled(told.output), expected);
+}
+
+INSTANTIATE_TEST_SUITE_P(Of, Signer,
+                         testing::Values("apksigner-sha256-2048", "apksigner-sha256-4096",
+                                         "apksigner-ec", "keytool-sha256"),
+                         [](const auto& info) {
+                           std::string name = info.param;
+                           name.erase(std::remove(name.begin(), name.end(), '-'), name.end());
+                           return name;
+                         });
+
+std::string Told(const std::string& name, const Lines& options = {}) {
+  Lines command = {"env", "LC_ALL=C.UTF-8", SimulatorPath()};
+  command.insert(command.end(), options.begin(), options.end());
+  command.push_back(Golden(name) + "/base.apk");
+  return RunProcess(command).output;
+}
+
+// The line of that beginning; empty when there is none.
+std::string LineWith(const std::string& text, const std::string& part) {
+  std::istringstream lines(text);
+  for (std::string line; std::getline(lines, line);) {
+    if (line.find(part) != std::string::npos) return line;
+  }
+  return "";
+}
+
+TEST(Schemes, AreThoseThatTheFileCarries) {
+  EXPECT_EQ(LineWith(Told("apksigner-sha256-2048"), "schemes:"), "    schemes: v1, v2, v3");
+  EXPECT_EQ(LineWith(Told("jarsigner-sha256"), "schemes:"), "    schemes: v1");
+}
+
+// What the kernel gets of the key is another digest than the one that is printed everywhere else.
+TEST(Signer, KernelsDigestIsThatOfTheModulusAlone) {
+  const ProcessResult modulus = RunProcess({"cat", Golden("apksigner-sha256-2048/digest")});
+  EXPECT_EQ(LineWith(Told("apksigner-sha256-2048"), "modulus SHA-256") + "\n",
+            "    modulus SHA-256 digest: " + modulus.output.substr(0, 64) +
+                " (of the modulus alone: what the kernel gets)\n");
+}
+
+TEST(Doubtful, GoodPackageHasNothing) {
+  EXPECT_EQ(LineWith(Told("apksigner-sha256-2048"), "  ! "), "");
+}
+
+TEST(Doubtful, SeveralSigners) {
+  const std::string told = Told("two-signers");
+  EXPECT_EQ(LineWith(told, "SIGNED").substr(0, 6), "SIGNED");
+  EXPECT_EQ(LineWith(told, "  ! "),
+            "  ! it has more than one signer; the kernel gets the key of META-INF/CERT.SF alone");
+}
+
+// Newer phones know the package by the new key, this tool by the old one.
+TEST(Doubtful, KeyThatWasRotated) {
+  const std::string told = Told("rotated-key");
+  EXPECT_EQ(LineWith(told, "  ! ").substr(0, 62),
+            "  ! the v3 signature (CN=rsa-2048-other, O=Example, public key");
+  EXPECT_NE(LineWith(told, "  ! ").find("is of another key than the JAR signature"),
+            std::string::npos);
+}
+
+TEST(Doubtful, EntryThatWasAddedAfterSigning) {
+  const std::string told = Told("added-entry", {"--verbose"});
+  EXPECT_EQ(LineWith(told, "does not protect"),
+            "  ! the signature does not protect 1 entry (6 bytes): no digest in the manifest");
+  EXPECT_EQ(LineWith(told, "not listed: "), "      not listed: assets/note.txt");
+  EXPECT_EQ(LineWith(Told("added-entry"), "not listed: "), "");
+}
+
+TEST(Doubtful, SchemesThatWereStripped) {
+  EXPECT_EQ(LineWith(Told("added-entry"), "as well"),
+            "  ! the signature file says that the package is signed with v2, v3 as well, and it is "
+            "not: phones do not install it");
+}
+
+}  // namespace
