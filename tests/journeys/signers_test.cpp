@@ -73,7 +73,7 @@ TEST(Schemes, AreThoseThatTheFileCarries) {
 }
 
 // What the kernel gets of the key is another digest than the one that is printed everywhere else.
-TEST(Signer, KernelsDigestIsThatOfTheModulusAlone) {
+TEST(KernelsDigest, IsThatOfTheModulusAlone) {
   const ProcessResult modulus = RunProcess({"cat", Golden("apksigner-sha256-2048/digest")});
   EXPECT_EQ(LineWith(Told("apksigner-sha256-2048"), "modulus SHA-256") + "\n",
             "    modulus SHA-256 digest: " + modulus.output.substr(0, 64) +
