@@ -12,8 +12,8 @@
 
 #include "simulator/phone/settings.h"
 #include "simulator/phone/text.h"
+#include "simulator/program/events.h"
 #include "simulator/program/run.h"
-#include "simulator/program/verdict.h"
 #include "support/expected_timeline.h"
 #include "support/files.h"
 #include "support/package.h"
@@ -67,15 +67,14 @@ class Installed {
     std::filesystem::remove(folder_ / "journal");
     phone_.journal = folder_ / "journal";
     Command command = {
-        {}, TOOL_PATH, file_, FAULT_INJECTOR ":" KERNEL_STAND_IN, SettingsToEnvironment(phone_),
-        20};
+        {}, TOOL_PATH, file_, FAULT_INJECTOR ":" KERNEL_STAND_IN, SettingsToEnvironment(phone_)};
     if (AreProgramsEmulated()) command.runner = Split(APKTOOLKIT_RUNNER, ' ');
     command.environment.push_back("APKTOOLKIT_FAULT=" + fault);
     command.environment.push_back("APKTOOLKIT_FAULT_REPORT=" + folder_ / "report");
     Outcome outcome;
     {
       const KeptStandardError kept(folder_ / "errors");
-      outcome.ending = ::Run(command);
+      outcome.ending = ::Run(command, Deadline(20));
     }
     outcome.failed = std::filesystem::exists(folder_ / "report");
     outcome.grants = Grants(ContentOf(phone_.journal), file_);
@@ -86,9 +85,8 @@ class Installed {
  private:
   static std::string Grants(const std::string& journal, const std::string& file) {
     std::string grants;
-    for (const std::string& line : Split(journal, '\n')) {
-      const auto event = nlohmann::json::parse(line, nullptr, false);
-      if (!event.is_object() || NumberOf(event, "result") != 0) continue;
+    for (const auto& event : ParseEvents(journal)) {
+      if (NumberOf(event, "result") != 0) continue;
       const std::string what = TextOf(event, "event");
       if (what == "sign") grants += Signed(event, file);
       if (what == "register")

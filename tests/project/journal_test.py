@@ -7,6 +7,7 @@ start apktoolkit-sim.
 
 import json
 import pathlib
+import shutil
 import subprocess
 import sys
 import tempfile
@@ -27,7 +28,7 @@ def replace_entry(package, ending, content, out):
 
 
 def runs(package, folder):
-    """Command lines of the simulator that between them provoke every event."""
+    """Command lines of the simulator that between them provoke every event and every verdict."""
     folder = pathlib.Path(folder)
     jar = folder / "library.jar"
     with zipfile.ZipFile(jar, "w") as archive:
@@ -37,11 +38,15 @@ def runs(package, folder):
     odd_name = folder / b"\xe9t\xc3\xa9.txt".decode(errors="surrogateescape")
     odd_name.write_text("no archive")
     yield [package]
+    yield ["--strict", "--jobs", "2", *sorted(package.parent.parent.glob("*/base.apk")), package]
     yield ["--sign-errno", "EPERM", "--zu-result", "7", package]
     yield ["--integrity", "missing", package]
     yield ["--integrity", "ffffffff", "--timeout", "1", package]
     yield [jar, folder / "absent.apk"]
     yield ["--trust", jar, jar]
+    alone = folder / "alone.apk"
+    shutil.copy(package, alone)
+    yield ["--strict", alone]
     yield [damaged]
     yield [odd_name]
 
@@ -49,7 +54,7 @@ def runs(package, folder):
 def main():
     package = pathlib.Path(sys.argv[1]) / "base.apk"
     validator = jsonschema.Draft202012Validator(SCHEMA)
-    problems, seen = [], {}
+    problems, seen, verdicts = [], {}, set()
     with tempfile.TemporaryDirectory() as folder:
         for run in runs(package, folder):
             journal = subprocess.run([*sys.argv[2:], "--json", *run], capture_output=True).stdout
@@ -57,10 +62,13 @@ def main():
                 event = json.loads(line)
                 problems += [f"{line}: {error.message}" for error in validator.iter_errors(event)]
                 seen[event["event"], "signal" in event] = event
+                verdicts.add(event.get("verdict"))
 
-    kinds = {branch["properties"]["event"]["const"]
-             for branch in SCHEMA["$defs"].values() if "properties" in branch}
+    kinds = {branch["properties"]["event"]["const"] for branch in SCHEMA["$defs"].values()
+             if "event" in branch.get("properties", {})}
     problems += [f"no run had the event {kind}" for kind in kinds - {kind for kind, _ in seen}]
+    known = set(SCHEMA["$defs"]["verdict"]["properties"]["verdict"]["enum"])
+    problems += [f"no run had the verdict {verdict}" for verdict in known - verdicts]
     # The schema must be able to say no: to an event without any one of its members.
     for event in seen.values():
         for member in event:
