@@ -11,6 +11,7 @@
 #include "support/jar.h"
 #include "support/package.h"
 #include "support/signature_block.h"
+#include "support/signing_block.h"
 
 namespace {
 
@@ -194,6 +195,27 @@ void MakePackages() {
   SeedPackage("registered-jar", options, 2);
 }
 
+// The first byte says which reader it is for (fuzz/explanation_fuzz.cpp).
+void SeedExplanation(const std::string& name, uint8_t reader, const Bytes& content) {
+  Seed("explanation", name, Concat({{reader}, content}));
+}
+
+void MakeExplanations() {
+  const Bytes signature_file = ToBytes("Signature-Version: 1.0\r\nX-Android-APK-Signed: 2\r\n\r\n");
+  const Bytes certificate = Certificate().Build();
+  const Bytes signer = Signers({SignerBytes(certificate)});
+  const Bytes block =
+      SigningBlockBytes({{kSchemeV2, signer}, {kSchemeV3, signer}, {kSchemeV31, signer}});
+  PackageOptions options;
+  options.block = SmallBlock();
+  SeedExplanation("package", 0, ArchiveWithBlock(MakePackage(options).Build(), block));
+  SeedExplanation("signing-block", 1, block);
+  SeedExplanation("certificate", 2, certificate);
+  SeedExplanation("signature-block", 3, SmallBlock().Build(signature_file));
+  SeedExplanation("signature-file", 4, signature_file);
+  SeedExplanation("compiled-manifest", 5, CompiledManifest("com.example.app", true));
+}
+
 }  // namespace
 
 int main(int argc, char* argv[]) {
@@ -209,5 +231,6 @@ int main(int argc, char* argv[]) {
   MakeTexts();
   MakeCompiledManifests();
   MakePackages();
+  MakeExplanations();
   return 0;
 }

@@ -17,6 +17,7 @@ WORKSTATION_ONLY = {
     "tests/crypto/x509_authorities_test.cpp": "runs openssl",
     "tests/util/digest_test.cpp": "runs coreutils",
     "fuzz/compiled_manifest_fuzz.cpp": "replaces the program's operator new",
+    "fuzz/explanation_fuzz.cpp": "reads with the simulator",
     "fuzz/integrity_fuzz.cpp": "has the linker wrap calls of the C library",
     "fuzz/mpi_fuzz.cpp": "compares with GMP",
     "fuzz/package_fuzz.cpp": "has the linker wrap a call of the zip library",

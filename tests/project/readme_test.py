@@ -1,0 +1,35 @@
+#!/usr/bin/env python3
+"""Runs scripts/demo, and holds what README.md shows of it against what it prints.
+
+Arguments: the command of the built apktoolkit-sim. A line of three dots on the page stands for lines
+that are left out.
+"""
+
+import os
+import re
+import subprocess
+import sys
+
+from sources import ROOT, report
+
+BLOCK = re.compile(r"^```\n\$ scripts/demo\n(.*?)\n```$", re.M | re.S)
+
+
+def pattern(shown):
+    """What is shown, as an expression that the whole output matches."""
+    parts = (re.escape(line + "\n") if line != "..." else r"(?:.*\n)*?" for line in shown)
+    return "".join(parts)
+
+
+def main():
+    shown = BLOCK.search((ROOT / "README.md").read_text())[1].splitlines()
+    run = subprocess.run([ROOT / "scripts/demo", sys.argv[1]], capture_output=True, text=True,
+                         env={**os.environ, "LC_ALL": "C.UTF-8"})
+    problems = [] if run.returncode == 0 else [f"scripts/demo ends with {run.returncode}", run.stderr]
+    if not re.fullmatch(pattern(shown), run.stdout):
+        problems += ["scripts/demo prints:", run.stdout]
+    return report(problems)
+
+
+if __name__ == "__main__":
+    sys.exit(main())
