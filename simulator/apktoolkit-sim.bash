@@ -23,6 +23,9 @@ _apktoolkit_sim() {
     --zu-result)
       mapfile -t COMPREPLY < <(compgen -W "0 65540 -1" -- "$word")
       ;;
+    --install)
+      mapfile -t COMPREPLY < <(compgen -W "phone all arm64 arm" -- "$word")
+      ;;
     --state)
       compopt -o filenames
       mapfile -t COMPREPLY < <(compgen -d -- "$word")
@@ -31,12 +34,13 @@ _apktoolkit_sim() {
       compopt -o filenames
       mapfile -t COMPREPLY < <(compgen -c -- "$word" && compgen -f -- "$word")
       ;;
-    --timeout | -h | --help) ;;
+    --timeout | --jobs | -h | --help | --version) ;;
     *)
       if [[ $word == -* ]]; then
         mapfile -t COMPREPLY < <(
-          compgen -W "--help --integrity --journal --json --runner --sign-errno --state
-            --timeout --tool --trust --verify-errno --zu-result" -- "$word"
+          compgen -W "--help --install --integrity --jobs --journal --json --quiet
+            --runner --sign-errno --state --strict --timeout --tool --trust --verbose
+            --verify-errno --version --zu-result" -- "$word"
         )
       else
         compopt -o filenames

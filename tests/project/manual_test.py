@@ -1,12 +1,19 @@
 #!/usr/bin/env python3
-"""Holds the manual pages against mandoc, and the simulator's page and completion against --help.
+"""Holds the manual pages against mandoc, the simulator's page and completion against --help, and runs
+the page's examples.
 
-Arguments: the words that start apktoolkit-sim.
+Arguments: the folder of a good package, and the words that start apktoolkit-sim.
 """
 
+import os
+import pathlib
 import re
+import shlex
+import shutil
 import subprocess
 import sys
+import tempfile
+import zipfile
 
 from sources import ROOT, report
 
@@ -22,11 +29,43 @@ def options(text):
     return set(re.findall(r"(?<![\w-])--[a-z][a-z-]*", text))
 
 
+def examples(page):
+    """The commands of the page's examples, as one types them."""
+    section = page.split(".Sh EXAMPLES\n")[1].split("\n.Sh ")[0]
+    for single, block in re.findall(r"^\.Dl \$ (.*)$|^\.Bd -literal.*\n\$ ((?:.*\n)*?)\.Ed$", section, re.M):
+        yield (single or block).replace("\\e", "\\")
+
+
+def run_examples(page, package, simulator):
+    """The examples that print nothing, complain, or end with another status than 0 or 1."""
+    problems = []
+    with tempfile.TemporaryDirectory() as name:
+        folder = pathlib.Path(name)
+        shutil.copytree(package, folder, dirs_exist_ok=True)
+        with zipfile.ZipFile(folder / "library.jar", "w") as archive:
+            archive.writestr("a.txt", "a")
+        (folder / "bin").mkdir()
+        command = folder / "bin/apktoolkit-sim"
+        command.write_text(f"#!/bin/sh\nexec {shlex.join(simulator)} \"$@\"\n")
+        command.chmod(0o755)
+        path = f"{folder}/bin:{os.environ['PATH']}"
+        count = 0
+        for example in examples(page):
+            run = subprocess.run(["bash", "-c", example], cwd=folder, capture_output=True, text=True,
+                                 env={**os.environ, "PATH": path})
+            count += 1
+            if run.returncode > 1 or run.stderr or not run.stdout:
+                problems += [f"$ {example}", f"ends with {run.returncode} and prints:",
+                             run.stdout + run.stderr]
+    return problems if count else ["the page has no examples"]
+
+
 def main():
+    package, *simulator = sys.argv[1:]
     problems = []
     for page in sorted((ROOT / "man").glob("*.1")):
         problems += lint(page)
-    usage = subprocess.run([*sys.argv[1:], "--help"], capture_output=True, text=True, check=True)
+    usage = subprocess.run([*simulator, "--help"], capture_output=True, text=True, check=True)
     known = options(usage.stdout)
     page = (ROOT / "man/apktoolkit-sim.1").read_text()
     described = {"-" + name for name in re.findall(r"\bFl (-[a-z][a-z-]*)", page)}
@@ -34,6 +73,7 @@ def main():
     for where, found in (("manual page", described), ("completion", completed)):
         problems += [f"{option} is not in the {where}" for option in sorted(known - found)]
         problems += [f"{option} in the {where} is no option" for option in sorted(found - known)]
+    problems += run_examples(page, package, simulator)
     return report(problems)
 
 
