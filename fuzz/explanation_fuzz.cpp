@@ -26,16 +26,15 @@ struct Free {
 };
 
 bool IsPartOf(std::string_view part, std::string_view whole) {
-  return part.empty() || (part.data() >= whole.data() &&
-                          part.data() + part.size() <= whole.data() + whole.size());
+  return part.empty() ||
+         (part.data() >= whole.data() && part.data() + part.size() <= whole.data() + whole.size());
 }
 
 // What libcrypto's own parser takes is read from the same places.
 void JudgeCertificate(std::string_view bytes) {
   const auto facts = ParseCertificate(bytes);
   const auto* at = reinterpret_cast<const uint8_t*>(bytes.data());
-  const std::unique_ptr<X509, Free> judge(
-      d2i_X509(nullptr, &at, static_cast<long>(bytes.size())));
+  const std::unique_ptr<X509, Free> judge(d2i_X509(nullptr, &at, static_cast<long>(bytes.size())));
   if (!facts || !judge) return;
   const std::unique_ptr<EVP_PKEY, Free> key(X509_get_pubkey(judge.get()));
   const RSA* const rsa = key == nullptr ? nullptr : EVP_PKEY_get0_RSA(key.get());
@@ -90,9 +89,9 @@ void ReadWholeFile(std::string_view bytes) {
 }  // namespace
 
 extern "C" int LLVMFuzzerTestOneInput(const uint8_t* data, size_t size) {
-  constexpr void (*kReaders[])(std::string_view) = {ReadWholeFile,       JudgeSigningBlock,
-                                                    JudgeCertificate,    JudgeSignatureBlock,
-                                                    JudgeJarManifest,    JudgeCompiledManifest};
+  constexpr void (*kReaders[])(std::string_view) = {ReadWholeFile,    JudgeSigningBlock,
+                                                    JudgeCertificate, JudgeSignatureBlock,
+                                                    JudgeJarManifest, JudgeCompiledManifest};
   if (size == 0) return 0;
   const size_t which = data[0] % (sizeof(kReaders) / sizeof(kReaders[0]));
   // A copy of its own size, so that one byte too far is found.

@@ -33,8 +33,8 @@ std::vector<ArchiveEntry> Archive::Entries(std::string_view prefix, std::string_
   ZipEntry entry;
   std::string name;
   while (Next(cookie, &entry, &name) == 0) {
-    entries.push_back(
-        {name, entry.compressed_length, entry.uncompressed_length, entry.method == kCompressStored});
+    entries.push_back({name, entry.compressed_length, entry.uncompressed_length,
+                       entry.method == kCompressStored});
   }
   EndIteration(cookie);
   return entries;

@@ -7,7 +7,8 @@
 #include <string>
 
 struct ArchiveEnd {
-  uint64_t directory_offset;  // of the central directory, as the record has it: maybe beyond the file
+  uint64_t
+      directory_offset;  // of the central directory, as the record has it: maybe beyond the file
 };
 
 // The end record of the file that is open as `fd`; none when it has none.

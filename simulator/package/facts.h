@@ -55,10 +55,11 @@ struct ListedEntry {
 
 struct PackageFacts {
   FileKind kind = FileKind::kUnreadable;
-  int error = 0;                // of opening the file
-  bool is_read_only = false;    // its file system is
-  uint64_t size = 0;            // of the file, in bytes
-  int32_t archive_result = -1;  // the zip library's; 0: it is an archive, and what follows is filled
+  int error = 0;              // of opening the file
+  bool is_read_only = false;  // its file system is
+  uint64_t size = 0;          // of the file, in bytes
+  int32_t archive_result =
+      -1;  // the zip library's; 0: it is an archive, and what follows is filled
 
   bool is_package = false;  // has an AndroidManifest.xml
   AndroidManifest manifest;

@@ -1,6 +1,6 @@
 // The texts of a JAR signature, as far as explaining needs them: which entries the manifest lists
-// with a digest, and what the signature file says of itself. Whether any of it holds is for the tool
-// to say.
+// with a digest, and what the signature file says of itself. Whether any of it holds is for the
+// tool to say.
 #pragma once
 
 #include <set>

@@ -1,5 +1,5 @@
-// The signatures of the schemes after JAR signing (v2, v3, v3.1), as far as whose key made them: the
-// signing block, which lies between an archive's entries and its central directory. Digests and
+// The signatures of the schemes after JAR signing (v2, v3, v3.1), as far as whose key made them:
+// the signing block, which lies between an archive's entries and its central directory. Digests and
 // signatures are not verified. What is read is bounded and points into the caller's bytes.
 #pragma once
 

@@ -1,6 +1,6 @@
 // Why something was not signed, and what to do: the one table of it. Its rows stand in
-// docs/messages.md as well, word for word, and their codes in docs/journal.schema.json; a test holds
-// the three together. A code never changes its meaning: scripts go by it.
+// docs/messages.md as well, word for word, and their codes in docs/journal.schema.json; a test
+// holds the three together. A code never changes its meaning: scripts go by it.
 //
 // A reason is the end of a sentence such as "not signed: …"; a cure is one or more sentences. "%s"
 // in a reason stands for what a single run fills in.
@@ -59,9 +59,9 @@ inline constexpr Cause kEmptyFile = {"empty-file", "it is empty, a file of 0 byt
                                      "Build, copy or download it again."};
 inline constexpr Cause kTextFile = {"text-file", "it is a text and not an archive",
                                     "Look into it: a failed download leaves its message so."};
-inline constexpr Cause kCutArchive = {
-    "cut-archive", "it begins like an archive and has no end: it was cut off",
-    "Copy or download it again, and compare the sizes."};
+inline constexpr Cause kCutArchive = {"cut-archive",
+                                      "it begins like an archive and has no end: it was cut off",
+                                      "Copy or download it again, and compare the sizes."};
 inline constexpr Cause kNoArchive = {"no-archive", "it is not a zip archive",
                                      "Name a package or a JAR."};
 inline constexpr Cause kEmptyArchive = {"empty-archive", "it is an archive without entries",
@@ -75,14 +75,14 @@ inline constexpr Cause kJarNotTrusted = {
     "Nothing, unless the JAR should have come from a trusted image; --trust makes it so here."};
 inline constexpr Cause kAndroidManifestDamaged = {
     "android-manifest-damaged",
-    "its AndroidManifest.xml cannot be extracted, so it counts as a plain JAR, which the kernel does "
+    "its AndroidManifest.xml cannot be extracted, so it counts as a plain JAR, which the kernel "
+    "does "
     "not trust",
     "Copy or build the package again; unzip -t names the damaged entry."};
 
 // ---- A package's signature.
-inline constexpr Cause kUnsigned = {
-    "unsigned", "it is unsigned: META-INF/MANIFEST.MF is missing",
-    "Sign it: apksigner sign --v1-signing-enabled true."};
+inline constexpr Cause kUnsigned = {"unsigned", "it is unsigned: META-INF/MANIFEST.MF is missing",
+                                    "Sign it: apksigner sign --v1-signing-enabled true."};
 inline constexpr Cause kNewerSchemeOnly = {
     "newer-scheme-only",
     "it is signed with %s alone, and this tool reads JAR signatures (v1): META-INF/MANIFEST.MF is "
@@ -106,16 +106,16 @@ inline constexpr Cause kSignatureBlockMissing = {
 inline constexpr Cause kSignatureBlockUnreadable = {
     "signature-block-unreadable", "its signature block %s cannot be extracted",
     "Copy or build the package again; unzip -t names the damaged entry."};
-inline constexpr Cause kSignatureBlockMalformed = {
-    "signature-block-malformed", "its signature block %s does not parse",
-    "Sign the package again with apksigner."};
+inline constexpr Cause kSignatureBlockMalformed = {"signature-block-malformed",
+                                                   "its signature block %s does not parse",
+                                                   "Sign the package again with apksigner."};
 inline constexpr Cause kEcKey = {"ec-key", "its key is an EC key, and this tool knows RSA alone",
                                  "Sign it with an RSA key of 2048 to 4096 bits."};
 inline constexpr Cause kDsaKey = {"dsa-key", "its key is a DSA key, and this tool knows RSA alone",
                                   "Sign it with an RSA key of 2048 to 4096 bits."};
-inline constexpr Cause kKeyTooLarge = {
-    "key-too-large", "its RSA key has %s bits, and this tool takes at most 4096",
-    "Sign it with an RSA key of 2048 to 4096 bits."};
+inline constexpr Cause kKeyTooLarge = {"key-too-large",
+                                       "its RSA key has %s bits, and this tool takes at most 4096",
+                                       "Sign it with an RSA key of 2048 to 4096 bits."};
 inline constexpr Cause kKeyTooSmall = {
     "key-too-small", "its RSA key has %s bits, and this tool takes no fewer than 128",
     "Sign it with an RSA key of 2048 to 4096 bits."};
@@ -170,7 +170,8 @@ inline constexpr Cause kDexNotListed = {
     "Sign the package again, as the last step that changes it. If nobody changed it: do not trust "
     "it."};
 inline constexpr Cause kDexDigest = {
-    "dex-digest", "the manifest has no digest of classes.dex that this tool reads: SHA-1 or SHA-256",
+    "dex-digest",
+    "the manifest has no digest of classes.dex that this tool reads: SHA-1 or SHA-256",
     "Sign it with SHA-256 digests, as apksigner does."};
 inline constexpr Cause kNoMemory = {"no-memory", "the tool had no memory left",
                                     "Run it again where there is more."};
@@ -229,7 +230,8 @@ inline constexpr Cause kNotReached = {"not-reached", "the tool did not come to i
 inline constexpr Cause kRegistrationRefused = {
     "registration-refused", "libzu answered %s",
     "The code is the library's own. What was signed stays signed."};
-inline constexpr Cause kRegistrationNoPath = {"registration-no-path", "its path cannot be found out",
+inline constexpr Cause kRegistrationNoPath = {"registration-no-path",
+                                              "its path cannot be found out",
                                               "Check that /proc is mounted and can be read."};
 
 // ---- The tool itself.
@@ -245,16 +247,17 @@ inline constexpr Cause kOtherKey = {
     "other-key",
     "%s is of another key than the JAR signature: phones install the package for that key, and the "
     "kernel gets this one",
-    "Sign it with one key for all schemes; a rotated key reaches the newer ones alone. If it is not "
+    "Sign it with one key for all schemes; a rotated key reaches the newer ones alone. If it is "
+    "not "
     "of your making: do not trust it."};
 inline constexpr Cause kSchemesStripped = {
     "schemes-stripped",
     "the signature file says that the package is signed with %s as well, and it is not: phones do "
     "not install it",
     "Sign the package again, as the last step that changes it."};
-inline constexpr Cause kSigningBlockDamaged = {
-    "signing-block-damaged", "the block of the schemes after v1 does not read",
-    "Sign the package again."};
+inline constexpr Cause kSigningBlockDamaged = {"signing-block-damaged",
+                                               "the block of the schemes after v1 does not read",
+                                               "Sign the package again."};
 inline constexpr Cause kSeveralSigners = {
     "several-signers", "it has more than one signer; the kernel gets the key of %s alone",
     "Sign it with one key."};

@@ -163,8 +163,8 @@ bool Extract(const Archive& archive, const std::string& entry, const std::string
   const int flags = O_WRONLY | O_CREAT | O_EXCL | O_NOFOLLOW | O_CLOEXEC;
   const OpenFile file(open(path.c_str(), flags, kMode));
   return file.get() >= 0 && archive.Stream(entry, [&](std::string_view part) {
-           return !deadline.HasPassed() && WriteAll(file.get(), part);
-         });
+    return !deadline.HasPassed() && WriteAll(file.get(), part);
+  });
 }
 
 bool WriteAll(int fd, std::string_view bytes) {

@@ -32,7 +32,10 @@ void AddLibraryItems(const RunRecord& run, const PackageFacts& facts, const Item
   const bool is_walked = own.state == ItemState::kDone || run.own || !run.libraries.empty();
   for (const Library& library : MatchAttempts(run, facts)) {
     if (library.place.empty()) {
-      items->push_back({ItemKind::kLibrary, library.entry, library.entry, ItemState::kNothing,
+      items->push_back({ItemKind::kLibrary,
+                        library.entry,
+                        library.entry,
+                        ItemState::kNothing,
                         {&cause::kLibraryOtherAbi, ""}});
     } else if (library.attempt == nullptr) {
       const Cause& why = is_walked ? cause::kNotReached : cause::kPackageRefused;

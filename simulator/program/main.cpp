@@ -64,8 +64,8 @@ int main(int argc, char** argv) {
   std::string error;
   if (!simulator.Prepare(&error)) return Complain(kCannotSimulate, error);
   if (!presenter.OpenJournal()) {
-    return Complain(kCannotSimulate, "cannot write the journal " + options.journal + ": " +
-                                         strerrordesc_np(errno));
+    return Complain(kCannotSimulate,
+                    "cannot write the journal " + options.journal + ": " + strerrordesc_np(errno));
   }
   CatchInterruptions();
   RunInOrder(
@@ -132,9 +132,9 @@ int Presenter::Finish() {
 void Presenter::Keep(const std::string& journal) {
   if (options_.json) std::cout << journal;
   if (options_.journal.empty() || journal_.Append(journal)) return;
-  status_ = std::max(status_, Complain(kCannotSimulate, "cannot write the journal " +
-                                                            options_.journal + ": " +
-                                                            strerrordesc_np(errno)));
+  status_ =
+      std::max(status_, Complain(kCannotSimulate, "cannot write the journal " + options_.journal +
+                                                      ": " + strerrordesc_np(errno)));
 }
 
 }  // namespace

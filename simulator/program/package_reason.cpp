@@ -205,7 +205,7 @@ Reason WhySilentlyRefused(const PackageFacts& facts) {
 
 // MD5, SHA-1 or SHA-256, by themselves or with RSA.
 bool IsKnownDigest(const std::string& algorithm) {
-  constexpr const char* kKnown[] = {"MD5",         "SHA-1",       "SHA-256",
+  constexpr const char* kKnown[] = {"MD5",        "SHA-1",       "SHA-256",
                                     "MD5withRSA", "SHA1withRSA", "SHA256withRSA"};
   return std::any_of(std::begin(kKnown), std::end(kKnown),
                      [&algorithm](const char* known) { return algorithm == known; });

@@ -135,8 +135,8 @@ void Printer::PrintItem(const Item& item, size_t width) {
   const std::string name = Shown(NameOf(item));
   const std::string gap(width + 2 - std::min(width, Columns(name)), ' ');
   const bool is_looked_at = report_.verdict != Verdict::kNotLookedAt;
-  const std::string text = "  " + std::string(Mark(item.state)) + " " + name + gap +
-                           Shown(TextOf(item, is_looked_at));
+  const std::string text =
+      "  " + std::string(Mark(item.state)) + " " + name + gap + Shown(TextOf(item, is_looked_at));
   out_ << Coloured(text, item.state == ItemState::kRefused ? Colour::kRed : Colour::kPlain, look_)
        << '\n';
 }

@@ -36,8 +36,8 @@ class Reader {
 
   RunRecord record_;
   Step step_ = Step::kOpening;
-  std::optional<Attempt> attempt_;     // begun, and not yet closed
-  std::vector<std::string> pending_;   // errors that the next line tells the use of
+  std::optional<Attempt> attempt_;      // begun, and not yet closed
+  std::vector<std::string> pending_;    // errors that the next line tells the use of
   std::optional<std::string> opening_;  // the library that could not be opened
 };
 
@@ -177,8 +177,8 @@ bool Reader::ReadKeyError(const std::string& text) {
   if (StartsWith(text, "Can't get jar location from fd=")) return record_.has_no_key_path = true;
   // The answer itself is an event.
   return StartsWith(text, "ZuAddCertificate: ZuNewCertificate failed ") &&
-         !record_.registrations.empty() && !IsZuSuccess(static_cast<int>(
-                                               record_.registrations.back().result));
+         !record_.registrations.empty() &&
+         !IsZuSuccess(static_cast<int>(record_.registrations.back().result));
 }
 
 // Whether it is the file itself that was signed, its path tells.
@@ -188,8 +188,7 @@ void Reader::ReadSign(const json& event) {
   attempt_->payload = TextOf(event, "payload");
   attempt_->error = NumberOf(event, "errno");
   const bool is_signed = NumberOf(event, "result") == 0;
-  attempt_->outcome =
-      is_signed ? Attempt::Outcome::kSigned : Attempt::Outcome::kKernelRefused;
+  attempt_->outcome = is_signed ? Attempt::Outcome::kSigned : Attempt::Outcome::kKernelRefused;
   if (is_signed) CloseAttempt();
 }
 

@@ -22,11 +22,12 @@ class Simulator {
   Simulator(const Simulator&) = delete;
   Simulator& operator=(const Simulator&) = delete;
 
-  // Opens the state and looks for the stand-ins and the tool. False, with `error` set to what to tell
-  // the user, when the simulation cannot begin.
+  // Opens the state and looks for the stand-ins and the tool. False, with `error` set to what to
+  // tell the user, when the simulation cannot begin.
   bool Prepare(std::string* error);
 
-  // Runs the tool for `file`. May be called from several threads when the options have several jobs.
+  // Runs the tool for `file`. May be called from several threads when the options have several
+  // jobs.
   Outcome Run(const std::string& file);
 
  private:

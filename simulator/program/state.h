@@ -1,9 +1,10 @@
 // What the phone's kernel has signed so far. A file stays trusted while it has the bytes that were
 // signed, and no longer, under whatever name.
 //
-// With a directory, what is remembered are SHA-256 digests, across runs: each is a file of that name
-// in the directory, which holds the path of what was signed, for the reader. Without one, files are
-// remembered as long as this object lives, and digested only when another is as long as they are.
+// With a directory, what is remembered are SHA-256 digests, across runs: each is a file of that
+// name in the directory, which holds the path of what was signed, for the reader. Without one,
+// files are remembered as long as this object lives, and digested only when another is as long as
+// they are.
 #pragma once
 
 #include <sys/stat.h>
@@ -17,8 +18,8 @@
 class SignedBytes {
  public:
   // `directory` is made when it is not there; empty: nothing is kept beyond this object. Where
-  // `shares` is false, what is added is kept for later runs alone, so that the order of the files of
-  // this run does not matter; then it may be used from several threads.
+  // `shares` is false, what is added is kept for later runs alone, so that the order of the files
+  // of this run does not matter; then it may be used from several threads.
   SignedBytes(std::string directory, bool shares)
       : directory_(std::move(directory)), shares_(shares) {}
 

@@ -52,10 +52,10 @@ void WarnOfOtherKeys(const PackageFacts& facts, std::vector<Reason>* warnings) {
       if (other == nullptr) other = &signer;
     }
     if (has_key) continue;
-    warnings->push_back({&cause::kOtherKey, "the " + scheme + " signature (" +
-                                                other->certificate.subject +
-                                                ", public key SHA-256 digest: " +
-                                                other->certificate.key.sha256 + ")"});
+    warnings->push_back(
+        {&cause::kOtherKey, "the " + scheme + " signature (" + other->certificate.subject +
+                                ", public key SHA-256 digest: " + other->certificate.key.sha256 +
+                                ")"});
   }
 }
 

@@ -65,13 +65,13 @@ TEST_F(Reason, Unsigned) {
 
 TEST_F(Reason, NewerSchemeOnly) {
   Take("apksigner-newer-only");
-  EXPECT_EQ(Told(4),
-            Lines({std::string("REFUSED  base.apk") + kVault,
-                   "  ✗ package                not signed: it is signed with v2, v3 alone, and "
-                   "this tool reads JAR signatures (v1): META-INF/MANIFEST.MF is missing",
-                   "      Sign it with v1 as well: enableV1Signing true for the Gradle plugin, or",
-                   "      apksigner sign --v1-signing-enabled true --min-sdk-version 23.",
-                   "-> 1"}));
+  EXPECT_EQ(
+      Told(4),
+      Lines({std::string("REFUSED  base.apk") + kVault,
+             "  ✗ package                not signed: it is signed with v2, v3 alone, and "
+             "this tool reads JAR signatures (v1): META-INF/MANIFEST.MF is missing",
+             "      Sign it with v1 as well: enableV1Signing true for the Gradle plugin, or",
+             "      apksigner sign --v1-signing-enabled true --min-sdk-version 23.", "-> 1"}));
 }
 
 TEST_F(Reason, SignedByJarsigner) {
@@ -87,14 +87,14 @@ TEST_F(Reason, SignedByJarsigner) {
 
 TEST_F(Reason, CertificateThatAnAuthorityIssued) {
   Take("openssl-cms-issued");
-  EXPECT_EQ(Told(3), Lines({"REFUSED  base.apk" +
-                                By("rsa-2048-other", "RSA-2048, key 03e5e653…57c52a"),
-                            "  ✗ package                not signed: its certificate was issued by "
-                            "another (CN=rsa-2048, O=Example), and this tool takes self-signed "
-                            "ones alone",
-                            "      Sign it with a self-signed certificate, which keytool "
-                            "-genkeypair makes.",
-                            "-> 1"}));
+  EXPECT_EQ(Told(3),
+            Lines({"REFUSED  base.apk" + By("rsa-2048-other", "RSA-2048, key 03e5e653…57c52a"),
+                   "  ✗ package                not signed: its certificate was issued by "
+                   "another (CN=rsa-2048, O=Example), and this tool takes self-signed "
+                   "ones alone",
+                   "      Sign it with a self-signed certificate, which keytool "
+                   "-genkeypair makes.",
+                   "-> 1"}));
 }
 
 TEST_F(Reason, EcKey) {
@@ -135,9 +135,9 @@ TEST_F(Reason, SignatureOverALongerDigest) {
 }
 
 TEST_F(Reason, Folder) {
-  EXPECT_EQ(Told(3, {}, "."), Lines({"REFUSED  .", "  ✗ file  not signed: it is a folder",
-                                     "      Name the package inside it, such as base.apk.",
-                                     "-> 1"}));
+  EXPECT_EQ(Told(3, {}, "."),
+            Lines({"REFUSED  .", "  ✗ file  not signed: it is a folder",
+                   "      Name the package inside it, such as base.apk.", "-> 1"}));
 }
 
 TEST_F(Reason, EmptyFile) {
@@ -175,18 +175,18 @@ TEST_F(Reason, DamagedArchive) {
 
 TEST_F(Reason, IntegrityValueZero) {
   Take("apksigner-sha256-2048");
-  EXPECT_EQ(Told(8, {"--integrity", "0"}),
-            Lines({"REFUSED  base.apk" + ByRsa2048(),
-                   "  ✗ package                not signed: the tool's own integrity value settled "
-                   "at 0, so that it may not sign",
-                   "  ✗ lib/arm64/libvault.so  not signed: the tool's own integrity value settled "
-                   "at 0, so that it may not sign",
-                   "  ✗ lib/arm/libvault.so    not signed: the tool's own integrity value settled "
-                   "at 0, so that it may not sign",
-                   "      The file was good. Look at the domain that the tool is started from: its",
-                   "      value is to be neither 0 nor ffffffff.",
-                   "  ✓ key                    registered for com.example.vault", "  signer",
-                   "-> 1"}));
+  EXPECT_EQ(
+      Told(8, {"--integrity", "0"}),
+      Lines({"REFUSED  base.apk" + ByRsa2048(),
+             "  ✗ package                not signed: the tool's own integrity value settled "
+             "at 0, so that it may not sign",
+             "  ✗ lib/arm64/libvault.so  not signed: the tool's own integrity value settled "
+             "at 0, so that it may not sign",
+             "  ✗ lib/arm/libvault.so    not signed: the tool's own integrity value settled "
+             "at 0, so that it may not sign",
+             "      The file was good. Look at the domain that the tool is started from: its",
+             "      value is to be neither 0 nor ffffffff.",
+             "  ✓ key                    registered for com.example.vault", "  signer", "-> 1"}));
 }
 
 TEST_F(Reason, KernelThatRefuses) {
@@ -205,9 +205,9 @@ TEST_F(Reason, NoPermission) {
   if (!CanMakeNamespaces()) GTEST_SKIP() << kNoNamespaces;
   Take("apksigner-sha256-2048");
   fs::permissions(folder_ / "base.apk", fs::perms::none);
-  EXPECT_EQ(Told(2, {}, "base.apk", {"unshare", "-U"}),
-            Lines({"NOT LOOKED AT  base.apk", "  ✗ file  not looked at: it may not be read",
-                   "-> 4"}));
+  EXPECT_EQ(
+      Told(2, {}, "base.apk", {"unshare", "-U"}),
+      Lines({"NOT LOOKED AT  base.apk", "  ✗ file  not looked at: it may not be read", "-> 4"}));
 }
 
 TEST_F(Reason, ReadOnlyFileSystem) {
@@ -272,9 +272,10 @@ TEST_F(Reason, TamperedSignatureFile) {
   Take("apksigner-sha256-2048");
   Do("unzip -q base.apk META-INF/CERT.SF; echo >>META-INF/CERT.SF;"
      " zip -q base.apk META-INF/CERT.SF");
-  EXPECT_EQ(Told(2)[1],
-            "  ✗ package                not signed: its signature file META-INF/CERT.SF was changed "
-            "after it was signed");
+  EXPECT_EQ(
+      Told(2)[1],
+      "  ✗ package                not signed: its signature file META-INF/CERT.SF was changed "
+      "after it was signed");
 }
 
 TEST_F(Reason, SignatureThatWasTakenOut) {

@@ -211,7 +211,7 @@ TEST_F(IncompletePackage, WithoutItsDexFileIsGood) {
 TEST_F(IncompletePackage, LibraryThatIsNotOnDiskIsNotSigned) {
   std::filesystem::remove(library_);
   ExpectLibraryAbsentAfter({Log(6, "Can't open file: " + library_ + "\n"),
-                             Log(6, "VeltSignJni: File not verified: " + library_ + "\n")});
+                            Log(6, "VeltSignJni: File not verified: " + library_ + "\n")});
 }
 
 TEST_F(IncompletePackage, LibraryThatIsADirectoryOnDiskIsRefused) {

@@ -9,7 +9,7 @@
 bool CanMakeNamespaces();
 inline constexpr char kNoNamespaces[] = "the kernel, or this container, allows no user namespaces";
 
-// The words that run a command with `file` copied to `mount_point`/base.apk, on a file system of its
-// own that takes `options`.
+// The words that run a command with `file` copied to `mount_point`/base.apk, on a file system of
+// its own that takes `options`.
 std::vector<std::string> OnItsOwnFileSystem(const std::string& file, const std::string& mount_point,
                                             const std::string& options);

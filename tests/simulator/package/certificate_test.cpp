@@ -40,11 +40,13 @@ TEST(CertificateFacts, OfAnRsaKey) {
   EXPECT_EQ(facts->key.algorithm, "RSA");
   EXPECT_EQ(facts->key.bits, 2048);
   EXPECT_EQ(facts->key.sha256,
-            Told(der, "openssl x509 -inform DER -in \"$0\" -noout -pubkey | openssl pkey -pubin "
-                      "-outform DER | sha256sum | cut -d' ' -f1"));
+            Told(der,
+                 "openssl x509 -inform DER -in \"$0\" -noout -pubkey | openssl pkey -pubin "
+                 "-outform DER | sha256sum | cut -d' ' -f1"));
   EXPECT_EQ(facts->key.modulus_sha256,
-            Told(der, "openssl x509 -inform DER -in \"$0\" -noout -modulus | sed s/.*=// | "
-                      "basenc --base16 -d | sha256sum | cut -d' ' -f1"));
+            Told(der,
+                 "openssl x509 -inform DER -in \"$0\" -noout -modulus | sed s/.*=// | "
+                 "basenc --base16 -d | sha256sum | cut -d' ' -f1"));
   EXPECT_EQ(facts->key.exponent, "\x01" + std::string(1, '\0') + "\x01");  // 65537
   EXPECT_EQ(facts->signature_algorithm, "SHA256withRSA");
   EXPECT_EQ(facts->subject, "CN=Test");
@@ -130,9 +132,10 @@ TEST(NameText, IsWhatTheJdkWrites) {
           {der::Set({der::Sequence({der::Oid("2.5.4.3"), der::Element(0x14, "caf\xe9")})})}),
   };
   const TempDir folder;
-  std::string command = "cd \"$0\"; for i in *; do LC_ALL=C.UTF-8 keytool -J-Dfile.encoding=UTF-8 "
-                        "-J-Dstdout.encoding=UTF-8 -printcert -file $i | sed -n 's/^Owner: //p'; "
-                        "done";
+  std::string command =
+      "cd \"$0\"; for i in *; do LC_ALL=C.UTF-8 keytool -J-Dfile.encoding=UTF-8 "
+      "-J-Dstdout.encoding=UTF-8 -printcert -file $i | sed -n 's/^Owner: //p'; "
+      "done";
   std::string expected;
   for (size_t i = 0; i < names.size(); ++i) {
     Certificate certificate;

@@ -45,8 +45,8 @@ TEST(CompiledManifestFacts, WhetherLibrariesAreExtracted) {
 
 TEST(CompiledManifestFacts, TextsBeyondReasonAreNotThere) {
   for (const auto pool : {CompiledXml::Pool::kUtf8, CompiledXml::Pool::kUtf16}) {
-    const CompiledXml xml = CompiledXml(pool).Element(
-        "manifest", {StringAttribute("package", std::string(1025, 'n'))});
+    const CompiledXml xml =
+        CompiledXml(pool).Element("manifest", {StringAttribute("package", std::string(1025, 'n'))});
     EXPECT_EQ(Read(xml.Build()).package_name, "");
   }
 }

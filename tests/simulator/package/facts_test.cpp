@@ -73,9 +73,9 @@ TEST(PackageFacts, OfASignedPackage) {
   EXPECT_EQ(facts.libraries.size(), 2U);
   EXPECT_TRUE(facts.newer.empty());
   EXPECT_FALSE(facts.has_damaged_signing_block);
-  EXPECT_EQ(NamesWhere(facts, [](const auto& e) { return e.is_signature; }),
-            std::vector<std::string>(
-                {"META-INF/CERT.RSA", "META-INF/CERT.SF", "META-INF/MANIFEST.MF"}));
+  EXPECT_EQ(
+      NamesWhere(facts, [](const auto& e) { return e.is_signature; }),
+      std::vector<std::string>({"META-INF/CERT.RSA", "META-INF/CERT.SF", "META-INF/MANIFEST.MF"}));
   EXPECT_EQ(NamesWhere(facts, [](const auto& e) { return !e.is_listed && !e.is_signature; }),
             std::vector<std::string>({"META-INF/services/x", "added"}));
 }

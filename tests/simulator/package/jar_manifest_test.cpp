@@ -9,9 +9,8 @@ using Names = std::set<std::string>;
 }  // namespace
 
 TEST(JarManifest, SectionsHaveAttributesAndContinuations) {
-  const std::vector<ManifestSection> expected = {
-      {{"Manifest-Version", "1.0"}},
-      {{"Name", "a long name"}, {"SHA1-Digest", "x"}}};
+  const std::vector<ManifestSection> expected = {{{"Manifest-Version", "1.0"}},
+                                                 {{"Name", "a long name"}, {"SHA1-Digest", "x"}}};
   EXPECT_EQ(ParseJarManifest("Manifest-Version: 1.0\r\n\r\nName: a lo\r\n ng name\r\n"
                              "SHA1-Digest: x\r\n\r\n"),
             expected);

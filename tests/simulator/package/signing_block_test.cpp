@@ -3,8 +3,8 @@
 #include <gtest/gtest.h>
 
 #include "simulator/package/archive_end.h"
-#include "support/newer_signers.h"
 #include "support/files.h"
+#include "support/newer_signers.h"
 #include "support/zip.h"
 
 namespace {
@@ -31,11 +31,11 @@ const Bytes kSigner = SignerBytes(ToBytes("CERT"));
 }  // namespace
 
 TEST(SigningBlock, EachSchemeHasItsSigners) {
-  const Bytes block = SigningBlockBytes({{kSchemeV2, Signers({kSigner})},
-                                         {0x42726577, Bytes(4000, 0)},  // padding
-                                         {kSchemeV3, Signers({SignerBytes(ToBytes("A")),
-                                                              SignerBytes(ToBytes("B"))})},
-                                         {kSchemeV31, Signers({kSigner})}});
+  const Bytes block = SigningBlockBytes(
+      {{kSchemeV2, Signers({kSigner})},
+       {0x42726577, Bytes(4000, 0)},  // padding
+       {kSchemeV3, Signers({SignerBytes(ToBytes("A")), SignerBytes(ToBytes("B"))})},
+       {kSchemeV31, Signers({kSigner})}});
   EXPECT_EQ(Read(block), Lines({"v2 CERT", "v3 A", "v3 B", "v3.1 CERT"}));
 }
 

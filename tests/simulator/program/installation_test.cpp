@@ -84,9 +84,9 @@ TEST(Installation, LeavesOutWhatCannotBeExtracted) {
   damaged.deflated = true;
   damaged.raw = ToBytes("no deflate stream");
   Files left_out;
-  EXPECT_EQ(LaidOut({{"lib/arm64-v8a/liba.so", ToBytes("good")}, damaged}, InstalledAbi::kAll,
-                    &left_out),
-            Files({"lib/arm64/liba.so good"}));
+  EXPECT_EQ(
+      LaidOut({{"lib/arm64-v8a/liba.so", ToBytes("good")}, damaged}, InstalledAbi::kAll, &left_out),
+      Files({"lib/arm64/liba.so good"}));
   EXPECT_EQ(left_out, Files({"lib/arm64-v8a/libb.so"}));
 }
 

@@ -82,12 +82,11 @@ PackageFacts WithLibraries(const Lines& entries) {
 }  // namespace
 
 TEST(MakeReport, GoodPackage) {
-  const Report report = Made({kLibrariesStart, kTakesUp, Integrity("1f"),
-                              Sign(kLibrary, kPackagePayload), kFileStart, kTakesUp,
-                              Integrity("1f"), Sign(kFile, kPackagePayload), Register(0)});
+  const Report report =
+      Made({kLibrariesStart, kTakesUp, Integrity("1f"), Sign(kLibrary, kPackagePayload), kFileStart,
+            kTakesUp, Integrity("1f"), Sign(kFile, kPackagePayload), Register(0)});
   EXPECT_EQ(report.verdict, Verdict::kSigned);
-  EXPECT_EQ(ItemsOf(report),
-            Lines({"package done", "lib/arm64/libfoo.so done", "com.app done"}));
+  EXPECT_EQ(ItemsOf(report), Lines({"package done", "lib/arm64/libfoo.so done", "com.app done"}));
   EXPECT_EQ(report.file, "base.apk");
   EXPECT_EQ(report.path, kFile);
 }
@@ -109,16 +108,15 @@ TEST(MakeReport, JarThatIsNotTrusted) {
 }
 
 TEST(MakeReport, DamagedAndroidManifestIsToldFromAJar) {
-  EXPECT_EQ(Items({Log(6, "Can't extract Android Manifest: Inconsistent information\n"),
-                   Verify(ENOKEY)}),
-            Lines({"JAR refused android-manifest-damaged"}));
+  EXPECT_EQ(
+      Items({Log(6, "Can't extract Android Manifest: Inconsistent information\n"), Verify(ENOKEY)}),
+      Lines({"JAR refused android-manifest-damaged"}));
 }
 
 TEST(MakeReport, TrustedJarThatTheKernelRefuses) {
   const Report report = Made({Verify(0), Sign(kFile, kNoData, EPERM)});
   EXPECT_EQ(report.verdict, Verdict::kRefused);
-  EXPECT_EQ(ItemsOf(report),
-            Lines({"JAR refused kernel-refused EPERM: Operation not permitted"}));
+  EXPECT_EQ(ItemsOf(report), Lines({"JAR refused kernel-refused EPERM: Operation not permitted"}));
 }
 
 TEST(MakeReport, ErrorAfterTheVerificationOfAJarCounts) {
@@ -193,8 +191,9 @@ TEST(MakeReport, LibrariesOfOtherProcessorsAreNothingToSign) {
                               kFileStart, Sign(kFile, kPackagePayload)},
                              facts);
   EXPECT_EQ(report.verdict, Verdict::kSigned);
-  EXPECT_EQ(ItemsOf(report), Lines({"package done", "lib/x86_64/libfoo.so nothing library-other-abi",
-                                    "lib/arm/libfoo.so done"}));
+  EXPECT_EQ(ItemsOf(report),
+            Lines({"package done", "lib/x86_64/libfoo.so nothing library-other-abi",
+                   "lib/arm/libfoo.so done"}));
 }
 
 TEST(MakeReport, LibrariesOfARefusedPackageFollowIt) {
@@ -217,9 +216,8 @@ TEST(MakeReport, LibrariesThatTheKernelWasNotAskedForAreKnownByTheirOrder) {
             Log(4, "VeltSign finished: 65536.\n")},
            facts);
   EXPECT_EQ(report.verdict, Verdict::kPartlySigned);
-  EXPECT_EQ(ItemsOf(report),
-            Lines({"package refused integrity-missing", "lib/arm64/liba.so done",
-                   "lib/arm64/libb.so refused integrity-zero"}));
+  EXPECT_EQ(ItemsOf(report), Lines({"package refused integrity-missing", "lib/arm64/liba.so done",
+                                    "lib/arm64/libb.so refused integrity-zero"}));
 }
 
 TEST(MakeReport, IntegrityValuesAreReadAsTheToolReadsThem) {
@@ -250,8 +248,7 @@ TEST(MakeReport, KeyThatLibzuRefuses) {
       Made({kFileStart, Sign(kFile, kPackagePayload), Log(4, "VeltSign finished: 0.\n"),
             Register(65541), Log(6, "ZuAddCertificate: ZuNewCertificate failed 65541.\n")});
   EXPECT_EQ(report.verdict, Verdict::kPartlySigned);
-  EXPECT_EQ(ItemsOf(report),
-            Lines({"package done", "com.app refused registration-refused 65541"}));
+  EXPECT_EQ(ItemsOf(report), Lines({"package done", "com.app refused registration-refused 65541"}));
 }
 
 TEST(MakeReport, KeyOfARefusedPackage) {
@@ -308,8 +305,7 @@ TEST(MakeReport, FailureOfTheSimulationIsNoVerdictOnTheFile) {
   around.failure = {&cause::kToolTimedOut, "2 seconds"};
   const Report report = Made({Sign(kFile, kPackagePayload)}, {}, around);
   EXPECT_EQ(report.verdict, Verdict::kNotSimulated);
-  EXPECT_EQ(report.items[0].reason.Text(),
-            "it was still busy after 2 seconds and was stopped");
+  EXPECT_EQ(report.items[0].reason.Text(), "it was still busy after 2 seconds and was stopped");
 }
 
 TEST(MakeReport, EachVerdictHasItsStatus) {

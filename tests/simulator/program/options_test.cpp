@@ -140,12 +140,32 @@ TEST(Options, HelpNamesEveryOptionAndStatus) {
   const ProcessResult result = Told({"--help"});
   EXPECT_EQ(result.status, 0);
   EXPECT_EQ(result.errors, "");
-  for (const char* word :
-       {"\nThe phone:\n", "--integrity TEXT[,TEXT]...", "--trust FILE ", "--sign-errno NAME",
-        "--verify-errno NAME", "--zu-result N", "--state DIR", "\nThe run:\n", "--install [=ABI]",
-        "--strict ", "--quiet ", "--verbose ", "--journal FILE", "--json ", "--jobs N",
-        "--tool PATH", "--timeout SECONDS", "--runner COMMAND", "--help ", "--version ",
-        "\n  0  all was", "\n  1  ", "\n  2  ", "\n  3  ", "\n  4  ", "man apktoolkit-sim"}) {
+  for (const char* word : {"\nThe phone:\n",
+                           "--integrity TEXT[,TEXT]...",
+                           "--trust FILE ",
+                           "--sign-errno NAME",
+                           "--verify-errno NAME",
+                           "--zu-result N",
+                           "--state DIR",
+                           "\nThe run:\n",
+                           "--install [=ABI]",
+                           "--strict ",
+                           "--quiet ",
+                           "--verbose ",
+                           "--journal FILE",
+                           "--json ",
+                           "--jobs N",
+                           "--tool PATH",
+                           "--timeout SECONDS",
+                           "--runner COMMAND",
+                           "--help ",
+                           "--version ",
+                           "\n  0  all was",
+                           "\n  1  ",
+                           "\n  2  ",
+                           "\n  3  ",
+                           "\n  4  ",
+                           "man apktoolkit-sim"}) {
     EXPECT_NE(result.output.find(word), std::string::npos) << word << "\n" << result.output;
   }
 }

@@ -145,9 +145,9 @@ TEST(WhyRefused, OfAManifest) {
   PackageFacts facts = Signed();
   EXPECT_EQ(Why({"Can't validate manifest.", "Can't validate manifest."}, facts),
             "manifest-changed");
-  EXPECT_EQ(Why({"verifyData: Unsupported digest type: MD5-Digest", "Can't validate manifest."},
-                facts),
-            "manifest-digest");
+  EXPECT_EQ(
+      Why({"verifyData: Unsupported digest type: MD5-Digest", "Can't validate manifest."}, facts),
+      "manifest-digest");
   facts.jar.has_manifest_digest = false;
   EXPECT_EQ(Why({"Can't validate manifest."}, facts), "manifest-digest");
   const std::string parse = "Parse manifest: Error: P_KEY: unexpected end of file after key 'x'";

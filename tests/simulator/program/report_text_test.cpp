@@ -28,9 +28,15 @@ Report Example() {
   report.items = {
       {ItemKind::kPackage, "package", "", ItemState::kDone, {}},
       {ItemKind::kLibrary, "lib/arm/libvault.so", "", ItemState::kDone, {}},
-      {ItemKind::kLibrary, "lib/arm64/libvault.so", "", ItemState::kRefused,
+      {ItemKind::kLibrary,
+       "lib/arm64/libvault.so",
+       "",
+       ItemState::kRefused,
        {&cause::kLibraryChanged, ""}},
-      {ItemKind::kLibrary, "lib/x86_64/libvault.so", "", ItemState::kNothing,
+      {ItemKind::kLibrary,
+       "lib/x86_64/libvault.so",
+       "",
+       ItemState::kNothing,
        {&cause::kLibraryOtherAbi, ""}},
       {ItemKind::kKey, "com.example.vault", "", ItemState::kDone, {}},
   };
@@ -82,15 +88,21 @@ TEST(ReportText, SignerStandsAsApksignerPrintsIt) {
             "98302ce8…f64646\n"
             "  signer\n"
             "    certificate DN: CN=Vault\n"
-            "    certificate SHA-256 digest: " + std::string(64, 'c') + "\n"
-            "    key algorithm: RSA\n"
-            "    key size (bits): 2048\n"
-            "    public key SHA-256 digest: " + std::string(64, 'a') + "\n"
-            "    modulus SHA-256 digest: 98302ce8" + std::string(50, '0') + "f64646"
-            " (of the modulus alone: what the kernel gets)\n"
-            "    schemes: v1, v2\n"
-            "    protects: 2 entries (100 bytes) verified, 0 entries (0 bytes) listed and not "
-            "checked, 1 entry (1 byte) not listed\n");
+            "    certificate SHA-256 digest: " +
+                std::string(64, 'c') +
+                "\n"
+                "    key algorithm: RSA\n"
+                "    key size (bits): 2048\n"
+                "    public key SHA-256 digest: " +
+                std::string(64, 'a') +
+                "\n"
+                "    modulus SHA-256 digest: 98302ce8" +
+                std::string(50, '0') +
+                "f64646"
+                " (of the modulus alone: what the kernel gets)\n"
+                "    schemes: v1, v2\n"
+                "    protects: 2 entries (100 bytes) verified, 0 entries (0 bytes) listed and not "
+                "checked, 1 entry (1 byte) not listed\n");
 }
 
 TEST(ReportText, QuietIsTheVerdictAlone) {
@@ -120,11 +132,12 @@ TEST(ReportText, WarningsStandOut) {
   Report report = Example();
   report.items.clear();
   report.warnings = {{&cause::kSchemesStripped, "v2"}};
-  EXPECT_EQ(Printed(report, {true, true}),
-            "\x1b[33mPARTLY SIGNED\x1b[0m  base.apk   com.example.vault\n"
-            "\x1b[33m  ! the signature file says that the package is signed with v2 as well, and it "
-            "is not: phones do not install it\x1b[0m\n"
-            "      Sign the package again, as the last step that changes it.\n");
+  EXPECT_EQ(
+      Printed(report, {true, true}),
+      "\x1b[33mPARTLY SIGNED\x1b[0m  base.apk   com.example.vault\n"
+      "\x1b[33m  ! the signature file says that the package is signed with v2 as well, and it "
+      "is not: phones do not install it\x1b[0m\n"
+      "      Sign the package again, as the last step that changes it.\n");
 }
 
 TEST(ReportText, RefusalsAreRedAndTheGoodVerdictIsGreen) {
@@ -139,9 +152,10 @@ TEST(ReportText, RefusalsAreRedAndTheGoodVerdictIsGreen) {
 // A cure that many have in common is said once.
 TEST(ReportText, NeighboursShareWhatToDo) {
   Report report = Example();
-  report.items = {{ItemKind::kLibrary, "a", "", ItemState::kAbsent, {&cause::kLibraryMissing, ""}},
-                  {ItemKind::kLibrary, "b", "", ItemState::kAbsent, {&cause::kLibraryMissing, ""}},
-                  {ItemKind::kLibrary, "c", "", ItemState::kRefused, {&cause::kPackageRefused, ""}}};
+  report.items = {
+      {ItemKind::kLibrary, "a", "", ItemState::kAbsent, {&cause::kLibraryMissing, ""}},
+      {ItemKind::kLibrary, "b", "", ItemState::kAbsent, {&cause::kLibraryMissing, ""}},
+      {ItemKind::kLibrary, "c", "", ItemState::kRefused, {&cause::kPackageRefused, ""}}};
   EXPECT_EQ(LinesOf(Printed(report)).size(), 5U);
 }
 
@@ -171,7 +185,6 @@ TEST(ReportText, NothingOfAHostileFileReachesATerminal) {
 }
 
 TEST(Summary, CountsEachVerdict) {
-  EXPECT_EQ(Summary({Verdict::kSigned, Verdict::kRefused, Verdict::kSigned,
-                     Verdict::kNotLookedAt}),
+  EXPECT_EQ(Summary({Verdict::kSigned, Verdict::kRefused, Verdict::kSigned, Verdict::kNotLookedAt}),
             "4 files: 2 signed, 1 refused, 1 not looked at");
 }

@@ -55,8 +55,8 @@ TEST(ExitStatus, OneWhenSomethingWasRefused) {
   const ProcessResult result = Simulated({probe.path()});
   EXPECT_EQ(result.status, 1);
   EXPECT_EQ(result.errors, "");
-  EXPECT_EQ(FirstLines(result, 2),
-            Lines({"REFUSED  " + probe.path(), "  ✗ package  not signed: it logged an error: a|5"}));
+  EXPECT_EQ(FirstLines(result, 2), Lines({"REFUSED  " + probe.path(),
+                                          "  ✗ package  not signed: it logged an error: a|5"}));
 }
 
 TEST(ExitStatus, OneWhenTheToolWasKilled) {
@@ -86,8 +86,8 @@ TEST(ExitStatus, FourForAFileThatIsNotThere) {
 TEST(ExitStatus, FourWhenStandardInputIsClosed) {
   const TempDir folder;
   const std::string file = folder.Write("note.txt", ToBytes("hello\n"));
-  const ProcessResult result = RunProcess({"bash", "-c", "exec \"$@\" <&-", "bash",
-                                           SimulatorPath(), file});
+  const ProcessResult result =
+      RunProcess({"bash", "-c", "exec \"$@\" <&-", "bash", SimulatorPath(), file});
   EXPECT_EQ(result.status, 4);
   EXPECT_NE(result.output.find("standard input is closed"), std::string::npos) << result.output;
 }
@@ -118,9 +118,9 @@ TEST(ExitStatus, OneForADevice) {
   const TempDir state;
   const ProcessResult result = Told({"--state", state.path(), "/dev/zero"});
   EXPECT_EQ(result.status, 1);
-  EXPECT_EQ(FirstLines(result, 2),
-            Lines({"REFUSED  /dev/zero",
-                   "  ✗ file  not signed: it is a device, a pipe or a socket"}));
+  EXPECT_EQ(
+      FirstLines(result, 2),
+      Lines({"REFUSED  /dev/zero", "  ✗ file  not signed: it is a device, a pipe or a socket"}));
 }
 
 TEST(ExitStatus, ThreeWhenAnotherProgramIsTheTool) {
@@ -260,10 +260,9 @@ TEST(Files, ShowNoProgressWithoutATerminal) {
 // util-linux's script gives it a terminal.
 TEST(Files, ShowProgressOnATerminalWhenItTakesLonger) {
   const Probe slow({"sign 3 0000", "sleep 2"});
-  const ProcessResult result =
-      RunProcess({"script", "-qec", SimulatorPath() + " --quiet --tool " + PROBE_PATH + " " +
-                                        slow.path(),
-                  "/dev/null"});
+  const ProcessResult result = RunProcess(
+      {"script", "-qec", SimulatorPath() + " --quiet --tool " + PROBE_PATH + " " + slow.path(),
+       "/dev/null"});
   const size_t progress = result.output.find("0 of 1 done; " + slow.path() + ": 1 s");
   EXPECT_NE(progress, std::string::npos) << result.output;
   // It is gone before the verdict comes.
@@ -273,8 +272,7 @@ TEST(Files, ShowProgressOnATerminalWhenItTakesLonger) {
 
 TEST(Interruption, EndsTheToolAndTheSimulatorByTheSignal) {
   const Probe slow({"sign 3 0000", "sleep 60"});
-  const ProcessResult result =
-      InShell("\"$@\" & sleep 1; kill -TERM $!; wait $!", {slow.path()});
+  const ProcessResult result = InShell("\"$@\" & sleep 1; kill -TERM $!; wait $!", {slow.path()});
   EXPECT_EQ(result.status, 128 + 15);
 }
 
@@ -334,8 +332,8 @@ TEST(Simulation, WorksFromAFolderThatTheLoaderCannotName) {
     fs::copy(built / "bin" / name, place + "/bin/" + name);
   }
   const Probe probe({"sign 3 0000", "register 3 name ab"});
-  const ProcessResult result = RunProcess(
-      {"env", "LC_ALL=C", place + "/bin/apktoolkit-sim", "--tool", place + "/bin/simulator_probe", probe.path()});
+  const ProcessResult result = RunProcess({"env", "LC_ALL=C", place + "/bin/apktoolkit-sim",
+                                           "--tool", place + "/bin/simulator_probe", probe.path()});
   EXPECT_EQ(result.status, 0) << result.errors;
   EXPECT_EQ(FirstLines(result, 3),
             Lines({"TRUSTED JAR  " + probe.path(), "  + JAR  signed, without data",

@@ -12,11 +12,20 @@ TEST(VerdictEvent, HoldsTheWholeReport) {
   report.package_name = "com.app";
   report.items = {
       {ItemKind::kPackage, "package", "", ItemState::kDone, {}},
-      {ItemKind::kLibrary, "lib/arm64/a.so", "lib/arm64-v8a/a.so", ItemState::kRefused,
+      {ItemKind::kLibrary,
+       "lib/arm64/a.so",
+       "lib/arm64-v8a/a.so",
+       ItemState::kRefused,
        {&cause::kKernelRefused, "EPERM"}},
-      {ItemKind::kLibrary, "lib/arm/a.so", "lib/armeabi/a.so", ItemState::kAbsent,
+      {ItemKind::kLibrary,
+       "lib/arm/a.so",
+       "lib/armeabi/a.so",
+       ItemState::kAbsent,
        {&cause::kLibraryMissing, ""}},
-      {ItemKind::kLibrary, "lib/x86/a.so", "lib/x86/a.so", ItemState::kNothing,
+      {ItemKind::kLibrary,
+       "lib/x86/a.so",
+       "lib/x86/a.so",
+       ItemState::kNothing,
        {&cause::kLibraryOtherAbi, ""}},
       {ItemKind::kKey, "com.app", "", ItemState::kDone, {}},
   };
@@ -37,8 +46,7 @@ TEST(VerdictEvent, HoldsTheWholeReport) {
   EXPECT_EQ(event["verdict"], "partly-signed");
   EXPECT_EQ(event["status"], 1);
   EXPECT_EQ(event["package"], "com.app");
-  EXPECT_EQ(event["items"],
-            Json::parse(R"json([
+  EXPECT_EQ(event["items"], Json::parse(R"json([
     {"kind": "package", "name": "package", "state": "signed"},
     {"kind": "library", "name": "lib/arm64/a.so", "entry": "lib/arm64-v8a/a.so",
      "state": "refused", "reason": "kernel-refused", "text": "the kernel refused (EPERM)"},
