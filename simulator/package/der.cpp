@@ -31,7 +31,7 @@ template <size_t kCount>
 std::string NameOf(CBS algorithm, const NamedOid (&names)[kCount]) {
   CBS oid;
   if (!CBS_get_asn1(&algorithm, &oid, CBS_ASN1_OBJECT)) return {};
-  const std::string text = OidText(oid);
+  std::string text = OidText(oid);
   for (const NamedOid& known : names) {
     if (text == known.oid) return known.name;
   }

@@ -42,7 +42,7 @@ bool JournalFile::Open(const std::string& path) {
   return fd_ >= 0;
 }
 
-bool JournalFile::Append(const std::string& lines) {
+bool JournalFile::Append(const std::string& lines) const {
   size_t written = 0;
   while (written < lines.size()) {
     const ssize_t part = write(fd_, lines.data() + written, lines.size() - written);

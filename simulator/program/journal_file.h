@@ -19,7 +19,7 @@ class JournalFile {
 
   // Begins the file anew. False, with errno set, when it cannot be written.
   bool Open(const std::string& path);
-  bool Append(const std::string& lines);
+  bool Append(const std::string& lines) const;
 
  private:
   int fd_ = -1;

@@ -26,7 +26,7 @@ class Presenter {
   void ShowProgress(const std::string& file, int seconds);
   void ShowSummary();
   // The highest status of all; kCannotSimulate at least when something could not be written.
-  int Finish();
+  int Finish() const;
 
  private:
   void Keep(const std::string& journal);
@@ -122,7 +122,7 @@ void Presenter::ShowSummary() {
   std::cout << '\n' << Summary(verdicts_) << '\n';
 }
 
-int Presenter::Finish() {
+int Presenter::Finish() const {
   std::cout.flush();
   if (std::cout) return status_;
   return Complain(std::max(status_, kCannotSimulate), "cannot write to standard output");

@@ -90,7 +90,7 @@ namespace {
 // The rest of the first line that begins so.
 std::optional<std::string> Find(const Lines& lines, const std::string& before) {
   for (const std::string& line : lines) {
-    if (const auto rest = Between(line, before, "")) return rest;
+    if (auto rest = Between(line, before, "")) return rest;
   }
   return {};
 }

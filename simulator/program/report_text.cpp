@@ -244,7 +244,7 @@ const char* Printer::Mark(ItemState state) const {
 std::string NameOf(const Item& item) { return item.kind == ItemKind::kKey ? "key" : item.name; }
 
 std::string TextOf(const Item& item, bool is_looked_at) {
-  const std::string reason = item.reason.Text();
+  std::string reason = item.reason.Text();
   if (item.state == ItemState::kDone) {
     if (item.kind == ItemKind::kPackage) return "signed with the payload of that key";
     if (item.kind == ItemKind::kJar) return "signed, without data";

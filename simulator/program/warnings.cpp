@@ -1,5 +1,7 @@
 #include "simulator/program/warnings.h"
 
+#include <algorithm>
+
 #include "simulator/program/package_reason.h"
 
 namespace {
@@ -44,18 +46,17 @@ namespace {
 void WarnOfOtherKeys(const PackageFacts& facts, std::vector<Reason>* warnings) {
   const std::string& key = facts.jar.certificate->key.sha256;
   for (const std::string& scheme : NewerSchemes(facts)) {
-    const NewerSignerFacts* other = nullptr;
-    bool has_key = false;
+    std::vector<CertificateFacts> signers;
     for (const NewerSignerFacts& signer : facts.newer) {
-      if (signer.scheme != scheme) continue;
-      has_key = has_key || signer.certificate.key.sha256 == key;
-      if (other == nullptr) other = &signer;
+      if (signer.scheme == scheme) signers.push_back(signer.certificate);
     }
-    if (has_key) continue;
+    const bool has_key = std::any_of(signers.begin(), signers.end(), [&key](const auto& signer) {
+      return signer.key.sha256 == key;
+    });
+    if (has_key || signers.empty()) continue;
     warnings->push_back(
-        {&cause::kOtherKey, "the " + scheme + " signature (" + other->certificate.subject +
-                                ", public key SHA-256 digest: " + other->certificate.key.sha256 +
-                                ")"});
+        {&cause::kOtherKey, "the " + scheme + " signature (" + signers[0].subject +
+                                ", public key SHA-256 digest: " + signers[0].key.sha256 + ")"});
   }
 }
 
