@@ -37,8 +37,8 @@ inline constexpr Cause kStandardInputClosed = {
 inline constexpr Cause kToolNotStarted = {"tool-not-started", "%s", "Check --tool and --runner."};
 inline constexpr Cause kToolTimedOut = {
     "tool-timed-out", "it was still busy after %s and was stopped",
-    "The tool waits for ever while its integrity value reads ffffffff, and for whoever writes to a "
-    "pipe. A large file may need a larger --timeout."};
+    "The tool waits for ever while its integrity value reads ffffffff. A large file may need a "
+    "larger --timeout."};
 inline constexpr Cause kStandInsMissing = {
     "stand-ins-missing", "the stand-ins were not loaded into %s",
     "Check --tool: it has to be a dynamically linked program for this processor or for --runner."};

@@ -9,6 +9,7 @@
 #include "support/files.h"
 #include "support/namespaces.h"
 #include "support/process.h"
+#include "support/signature_block.h"
 #include "support/simulation.h"
 
 namespace {
@@ -132,6 +133,26 @@ TEST_F(Reason, SignatureOverALongerDigest) {
   EXPECT_EQ(Told(2)[1],
             "  ✗ package                not signed: it is signed over SHA-512, and this tool reads "
             "MD5, SHA-1 and SHA-256");
+}
+
+// No tool makes such a block: it is written down, without any private key, for another's key.
+TEST_F(Reason, ExponentOfOne) {
+  Take("apksigner-sha256-2048");
+  Do("unzip -q base.apk META-INF/CERT.SF");
+  const Bytes signature_file = ToBytes(ContentOf(folder_ / "META-INF/CERT.SF"));
+  const auto refusal = [&](const Bytes& exponent) {
+    folder_.Write("META-INF/CERT.RSA", ForgedBlock(signature_file, "rsa-2048", exponent));
+    Do("zip -q base.apk META-INF/CERT.RSA");
+    return Told(3);
+  };
+  const Lines told = refusal({1});
+  EXPECT_EQ(told[1],
+            "  ✗ package                not signed: its RSA key has the public exponent 1, with "
+            "which anyone can make its signatures");
+  EXPECT_EQ(told[2], "      Do not trust this package. A key of one's own has the exponent 65537.");
+  EXPECT_EQ(refusal({0xff, 0xff, 0xff, 0xff})[1],
+            "  ✗ package                not signed: its RSA key has the public exponent "
+            "0xffffffff, which is read as 1, with which anyone can make its signatures");
 }
 
 TEST_F(Reason, Folder) {
