@@ -43,7 +43,8 @@ class Presenter {
 
 int Complain(int status, const std::string& message) {
   std::cout.flush();
-  std::cerr << "apktoolkit-sim: " << message << '\n';
+  std::cerr << "apktoolkit-sim: " << Printable(message, {false, LookOfStandardOutput().has_utf8})
+            << '\n';
   return status;
 }
 
@@ -97,8 +98,7 @@ void Presenter::Show(const Outcome& outcome) {
   std::cout.flush();
   verdicts_.push_back(report.verdict);
   if (report.verdict == Verdict::kNotSimulated) {
-    const Look look = {false, look_.has_utf8};
-    Complain(kCannotSimulate, Printable(report.file + ": " + report.items[0].reason.Text(), look));
+    Complain(kCannotSimulate, report.file + ": " + report.items[0].reason.Text());
   }
   status_ = std::max(status_, StatusOf(report.verdict));
 }

@@ -207,7 +207,8 @@ std::optional<int> NameUnknownOption(const CLI::App& app) {
   std::vector<std::string> unknown = app.remaining();
   unknown.erase(std::remove(unknown.begin(), unknown.end(), "--"), unknown.end());
   if (unknown.empty()) return {};
-  std::cerr << "there is no option " << unknown[0] << " (a file of that name: ./" << unknown[0]
+  const std::string word = Printable(unknown[0], {});
+  std::cerr << "there is no option " << word << " (a file of that name: ./" << word
             << ")\nRun with --help for more information.\n";
   return kUsageError;
 }

@@ -11,7 +11,8 @@ constexpr size_t kMostName = 40;
 
 struct VerdictWords {
   const char* word;
-  const char* plural;  // in the summary
+  const char* one;  // in the summary, after a number
+  const char* many;
   Colour colour;
 };
 
@@ -75,7 +76,8 @@ std::string Summary(const std::vector<Verdict>& verdicts) {
         Verdict::kNotTrustedJar, Verdict::kNotLookedAt, Verdict::kNotSimulated}) {
     const auto count = std::count(verdicts.begin(), verdicts.end(), verdict);
     if (count == 0) continue;
-    text += (is_first ? "" : ", ") + std::to_string(count) + " " + WordsOf(verdict).plural;
+    text += (is_first ? "" : ", ") + std::to_string(count) + " " +
+            (count == 1 ? WordsOf(verdict).one : WordsOf(verdict).many);
     is_first = false;
   }
   return text;
@@ -86,21 +88,21 @@ namespace {
 VerdictWords WordsOf(Verdict verdict) {
   switch (verdict) {
     case Verdict::kSigned:
-      return {"SIGNED", "signed", Colour::kGreen};
+      return {"SIGNED", "signed", "signed", Colour::kGreen};
     case Verdict::kPartlySigned:
-      return {"PARTLY SIGNED", "partly signed", Colour::kYellow};
+      return {"PARTLY SIGNED", "partly signed", "partly signed", Colour::kYellow};
     case Verdict::kRefused:
-      return {"REFUSED", "refused", Colour::kRed};
+      return {"REFUSED", "refused", "refused", Colour::kRed};
     case Verdict::kTrustedJar:
-      return {"TRUSTED JAR", "trusted JARs", Colour::kGreen};
+      return {"TRUSTED JAR", "trusted JAR", "trusted JARs", Colour::kGreen};
     case Verdict::kNotTrustedJar:
-      return {"NOT TRUSTED JAR", "JARs not trusted", Colour::kRed};
+      return {"NOT TRUSTED JAR", "JAR not trusted", "JARs not trusted", Colour::kRed};
     case Verdict::kNotLookedAt:
-      return {"NOT LOOKED AT", "not looked at", Colour::kRed};
+      return {"NOT LOOKED AT", "not looked at", "not looked at", Colour::kRed};
     case Verdict::kNotSimulated:
-      return {"NOT SIMULATED", "not simulated", Colour::kRed};
+      return {"NOT SIMULATED", "not simulated", "not simulated", Colour::kRed};
   }
-  return {"", "", Colour::kPlain};
+  return {"", "", "", Colour::kPlain};
 }
 
 void Printer::PrintHead() {

@@ -210,7 +210,7 @@ TEST(Files, AreSetApartAndSummedUp) {
   const ProcessResult result = Simulated({good.path(), bad.path(), good.path()});
   EXPECT_NE(result.output.find("\n\nNOT TRUSTED JAR  " + bad.path() + "\n"), std::string::npos)
       << result.output;
-  EXPECT_EQ(LinesOf(result.output).back(), "3 files: 2 trusted JARs, 1 JARs not trusted");
+  EXPECT_EQ(LinesOf(result.output).back(), "3 files: 2 trusted JARs, 1 JAR not trusted");
 }
 
 TEST(Files, AreVerdictsAloneWhenAsked) {
@@ -268,6 +268,18 @@ TEST(Interruption, EndsTheToolAndTheSimulatorByTheSignal) {
   const Probe slow({"sign 3 0000", "sleep 60"});
   const ProcessResult result = InShell("\"$@\" & sleep 1; kill -TERM $!; wait $!", {slow.path()});
   EXPECT_EQ(result.status, 128 + 15);
+}
+
+// Names may come from whoever made the files.
+TEST(Files, NamesReachNoTerminalAsTheyAre) {
+  const TempDir folder;
+  const std::string odd = folder.Write("-\x1b]0;x\x07", ToBytes("sign 3 0000\n"));
+  for (const Lines& words :
+       {Lines({odd}), Lines({"-\x1b]0;x\x07"}), Lines({"--journal", odd, odd})}) {
+    const ProcessResult result = Simulated(words);
+    EXPECT_EQ((result.output + result.errors).find('\x1b'), std::string::npos) << result.output;
+    EXPECT_NE((result.output + result.errors).find("\\x1b"), std::string::npos) << result.output;
+  }
 }
 
 TEST(Journal, StartsWithTheVersionTheFileAndTheProcess) {
