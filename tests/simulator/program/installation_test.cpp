@@ -12,7 +12,7 @@ namespace {
 
 namespace fs = std::filesystem;
 
-const Deadline kLater(60);
+const Deadline kLater(1e6);
 
 // "path content" of each file that is laid out beside the package.
 std::vector<std::string> LaidOut(const std::vector<ZipItem>& libraries, InstalledAbi abi,
