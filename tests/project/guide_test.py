@@ -9,14 +9,13 @@ follows, and a command that is followed by them alone prints what it likes.
 import os
 import pathlib
 import re
-import shlex
 import shutil
 import subprocess
 import sys
 import tempfile
 import zipfile
 
-from sources import ROOT, report
+from sources import ROOT, path_with_simulator, report
 
 PAGE = ROOT / "docs/guide.md"
 FOLDER = "/data/app/vault"  # what the page has in place of this test's folder
@@ -27,8 +26,8 @@ VARIES = [(re.compile(r"certificate SHA-256 digest: [0-9a-f]{64}"), "certificate
           (re.compile(r"(signer CN=Example, RSA-2048, key ).*"), r"\1*")]
 
 
-def prepare(golden, simulator, folder):
-    """The files that the page speaks of, and the command that it runs."""
+def prepare(golden, folder):
+    """The files that the page speaks of."""
     package = golden / "apksigner-sha256-2048"
     shutil.copy(package / "base.apk", folder)
     shutil.copytree(package, folder / "tampered")
@@ -44,10 +43,6 @@ def prepare(golden, simulator, folder):
     (folder / "notes.txt").write_text("nothing")
     with zipfile.ZipFile(folder / "library.jar", "w") as archive:
         archive.writestr("a.txt", "a")
-    (folder / "bin").mkdir()
-    command = folder / "bin/apktoolkit-sim"
-    command.write_text(f"#!/bin/sh\nexec {shlex.join(simulator)} \"$@\"\n")
-    command.chmod(0o755)
 
 
 def commands(block):
@@ -60,14 +55,14 @@ def commands(block):
 class Shell:
     """A shell in the folder, so that a command finds what the one before it left."""
 
-    def __init__(self, folder):
+    def __init__(self, folder, simulator):
         self.folder = folder
+        self.path = path_with_simulator(folder, simulator)
         self.status = 0
 
     def run(self, command):
-        path = f"{self.folder}/bin:{os.environ['PATH']}"
         run = subprocess.run(["bash", "-c", f"(exit {self.status})\n{command}"], cwd=self.folder,
-                             env={**os.environ, "PATH": path, "LC_ALL": "C.UTF-8"},
+                             env={**os.environ, "PATH": self.path, "LC_ALL": "C.UTF-8"},
                              stdout=subprocess.PIPE, stderr=subprocess.STDOUT, text=True)
         self.status = run.returncode
         return run.stdout.replace(str(self.folder), FOLDER).splitlines()
@@ -103,8 +98,8 @@ def main():
     problems = [] if BLOCK.search(page) else ["docs/guide.md shows no command"]
     with tempfile.TemporaryDirectory() as name:
         folder = pathlib.Path(name).resolve()
-        prepare(pathlib.Path(golden), simulator, folder)
-        shell = Shell(folder)
+        prepare(pathlib.Path(golden), folder)
+        shell = Shell(folder, simulator)
         for block in BLOCK.findall(page):
             found, right = check(block, shell)
             problems += found

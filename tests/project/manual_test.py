@@ -8,14 +8,13 @@ Arguments: the folder of a good package, and the words that start apktoolkit-sim
 import os
 import pathlib
 import re
-import shlex
 import shutil
 import subprocess
 import sys
 import tempfile
 import zipfile
 
-from sources import ROOT, report
+from sources import ROOT, path_with_simulator, report
 
 
 def lint(page):
@@ -44,11 +43,7 @@ def run_examples(page, package, simulator):
         shutil.copytree(package, folder, dirs_exist_ok=True)
         with zipfile.ZipFile(folder / "library.jar", "w") as archive:
             archive.writestr("a.txt", "a")
-        (folder / "bin").mkdir()
-        command = folder / "bin/apktoolkit-sim"
-        command.write_text(f"#!/bin/sh\nexec {shlex.join(simulator)} \"$@\"\n")
-        command.chmod(0o755)
-        path = f"{folder}/bin:{os.environ['PATH']}"
+        path = path_with_simulator(folder, simulator)
         count = 0
         for example in examples(page):
             run = subprocess.run(["bash", "-c", example], cwd=folder, capture_output=True, text=True,

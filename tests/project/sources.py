@@ -1,7 +1,9 @@
 """What the tests of this folder read from the project's own files."""
 
+import os
 import pathlib
 import re
+import shlex
 
 ROOT = pathlib.Path(__file__).resolve().parents[2]
 ROOMS = ("sign", "apk", "crypto", "util")
@@ -18,6 +20,15 @@ def without_comments(text):
     """C++ text with its comments removed; string literals stay whole."""
     token = re.compile(r'"(?:[^"\\\n]|\\.)*"|//[^\n]*|/\*.*?\*/', re.S)
     return token.sub(lambda match: match[0] if match[0].startswith('"') else " ", text)
+
+
+def path_with_simulator(folder, simulator):
+    """A search path on which apktoolkit-sim is what these words start, from a script in the folder."""
+    (folder / "bin").mkdir()
+    command = folder / "bin/apktoolkit-sim"
+    command.write_text(f"#!/bin/sh\nexec {shlex.join(simulator)} \"$@\"\n")
+    command.chmod(0o755)
+    return f"{folder}/bin:{os.environ['PATH']}"
 
 
 def report(problems):
