@@ -23,7 +23,7 @@ endif()
 
 # Unsigned numbers may wrap, but in the tool only where it says that it means them to
 # (crypto/wrapping.h).
-option(APKTOOLKIT_CHECK_OVERFLOW "Take unsigned overflow for a mistake (clang; scripts/check)" OFF)
+option(APKTOOLKIT_CHECK_OVERFLOW "Take unsigned overflow for a mistake (clang)" OFF)
 if(APKTOOLKIT_CHECK_OVERFLOW)
   list(APPEND APKTOOLKIT_TOOL_OPTIONS -fsanitize=unsigned-integer-overflow
     -fsanitize-ignorelist=${PROJECT_SOURCE_DIR}/cmake/foreign_code.txt)

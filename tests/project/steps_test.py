@@ -1,0 +1,110 @@
+#!/usr/bin/env python3
+"""Holds the steps of scripts/check against what the papers say of them, and has scripts/check run
+steps that pass, fail and skip."""
+
+import pathlib
+import re
+import shutil
+import subprocess
+import sys
+import tempfile
+
+from sources import ROOT, report
+
+
+def listed_steps():
+    table = re.search(r"^steps='\n(.*?)\n'$", (ROOT / "scripts/check").read_text(), re.M | re.S)
+    return [line.split()[0] for line in table[1].splitlines()]
+
+
+def everyday_steps():
+    return re.search(r"/check\" (.*)", (ROOT / "scripts/test").read_text())[1].split()
+
+
+def part(path, beginning, end):
+    """The text of the file between the two, patterns for whole lines."""
+    return re.search(rf"^{beginning}\n(.*?)^{end}$", (ROOT / path).read_text(), re.M | re.S)[1]
+
+
+def known_to_setup():
+    return {word for words in re.findall(r"^ +([\w |]+)\)",
+                                         part("scripts/setup", r"groups_of\(\) {[^\n]*", "}"), re.M)
+            for word in words.split(" | ")}
+
+
+def setup_problems():
+    """Whatever is asked of scripts/setup is known to it."""
+    asked = {("scripts/check", step) for step in listed_steps()}
+    for path in (ROOT / "scripts").iterdir():
+        asked |= {(path.name, word) for words in re.findall(r"^ *scripts/setup ([\w ]+)$",
+                                                            path.read_text(), re.M)
+                  for word in words.split()}
+    return [f"{who} asks scripts/setup for {word}, which it does not know"
+            for who, word in sorted(asked) if word not in known_to_setup()]
+
+
+def list_problems():
+    """Every step is a function, and the papers name it, in the same order."""
+    steps, everyday = listed_steps(), everyday_steps()
+    functions = re.findall(r"^step_(\w+)\(\)", (ROOT / "scripts/check").read_text(), re.M)
+    page = part("docs/testing.md", "## Steps", "## .*")
+    shown = part("README.md", r"\$ scripts/test", "```")
+    problems = []
+    for what, found, expected in (
+            ("functions", functions, steps),
+            ("docs/testing.md", re.findall(r"^\| `(\w+)`", page, re.M), steps),
+            ("docs/testing.md, with a star", re.findall(r"^\| `(\w+)` \*", page, re.M), everyday),
+            ("README.md", re.findall(r"^([a-z]\w+) .*build/logs", shown, re.M), everyday)):
+        if found != expected:
+            problems.append(f"{what}: {found} in place of {expected}")
+    return problems
+
+
+def check(folder, *steps):
+    run = subprocess.run([folder / "scripts/check", *steps], capture_output=True, text=True)
+    return re.sub(r"\(\d+ s, ", "(N s, ", run.stdout).splitlines(), run.returncode
+
+
+def write(path, content):
+    path.write_text("#!/bin/bash\n" + content)
+    path.chmod(0o755)
+
+
+def run_problems():
+    """What scripts/check makes of steps that end in every way."""
+    with tempfile.TemporaryDirectory() as name:
+        folder = pathlib.Path(name)
+        (folder / "scripts").mkdir()
+        shutil.copy(ROOT / "scripts/check", folder / "scripts")
+        write(folder / "scripts/setup", "true")
+        write(folder / "scripts/check-arrows", "echo arrow; echo all 3 are allowed")
+        write(folder / "scripts/format", "echo bad.cpp; exit 1")
+        write(folder / "scripts/run-tests", """echo "test $1 passed"
+            echo "skipped A.B: no kernel"
+            [[ $1 == release ]] || echo "FAILED A.C: one"
+            echo "1 passed"
+            [[ $1 == release ]]""")
+        found = check(folder, "arrows", "release", "format", "sanitize")
+        expected = (["arrows        all 3 are allowed (N s, build/logs/arrows.log)",
+                     "release       1 passed (N s, build/logs/release.log)",
+                     "    skipped A.B: no kernel",
+                     "format        FAILED (N s, build/logs/format.log)",
+                     "    bad.cpp",
+                     "sanitize      FAILED (N s, build/logs/sanitize.log)",
+                     "    skipped A.B: no kernel",
+                     "    FAILED A.C: one",
+                     "    1 passed",
+                     "steps: 2 passed, 2 failed"], 1)
+        problems = [] if found == expected else [f"scripts/check ends with {found}"]
+        if (found := check(folder, "arrows"))[1] != 0:
+            problems.append(f"scripts/check does not pass: {found}")
+        if (found := check(folder, "arrow"))[1] != 2:
+            problems.append(f"scripts/check takes a step that there is not: {found}")
+        write(folder / "scripts/setup", "exit 1")
+        if (found := check(folder, "arrows"))[1] == 0:
+            problems.append(f"scripts/check goes on without its packages: {found}")
+    return problems
+
+
+if __name__ == "__main__":
+    sys.exit(report(list_problems() + setup_problems() + run_problems()))
