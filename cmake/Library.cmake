@@ -1,0 +1,35 @@
+# What is installed for programs that verify packages themselves (examples/): the library that holds
+# all of the tool's code, the headers of the verification, and what CMake's find_package and
+# pkg-config ask for. The folder include/apktoolkit has the layout of the sources, so that a header
+# finds the others under the names that it includes them by.
+if(APKTOOLKIT_ZIPSTRING)
+  return()  # built against a library of the tests
+endif()
+include(CMakePackageConfigHelpers)
+
+set(APKTOOLKIT_HEADER_DIR ${CMAKE_INSTALL_INCLUDEDIR}/apktoolkit)
+set(APKTOOLKIT_CONFIG_DIR ${CMAKE_INSTALL_LIBDIR}/cmake/apktoolkit)
+
+install(DIRECTORY apk crypto util DESTINATION ${APKTOOLKIT_HEADER_DIR}
+  FILES_MATCHING PATTERN "*.h")
+install(TARGETS apktoolkit_core EXPORT apktoolkit INCLUDES DESTINATION ${APKTOOLKIT_HEADER_DIR})
+set_target_properties(apktoolkit_core PROPERTIES EXPORT_NAME core)
+target_compile_features(apktoolkit_core PUBLIC cxx_std_17)
+
+install(EXPORT apktoolkit NAMESPACE apktoolkit:: FILE apktoolkit-targets.cmake
+  DESTINATION ${APKTOOLKIT_CONFIG_DIR})
+configure_package_config_file(cmake/apktoolkit-config.cmake.in apktoolkit-config.cmake
+  INSTALL_DESTINATION ${APKTOOLKIT_CONFIG_DIR} NO_SET_AND_CHECK_MACRO)
+write_basic_package_version_file(apktoolkit-config-version.cmake COMPATIBILITY SameMajorVersion)
+install(FILES ${PROJECT_BINARY_DIR}/apktoolkit-config.cmake
+  ${PROJECT_BINARY_DIR}/apktoolkit-config-version.cmake cmake/PlatformLibraries.cmake
+  DESTINATION ${APKTOOLKIT_CONFIG_DIR})
+
+cmake_path(RELATIVE_PATH CMAKE_INSTALL_PREFIX
+  BASE_DIRECTORY ${CMAKE_INSTALL_FULL_LIBDIR}/pkgconfig OUTPUT_VARIABLE APKTOOLKIT_PC_PREFIX)
+# By their paths: the platform's libcrypto is not to be found in the place of another.
+list(TRANSFORM PLATFORM_LIBRARIES REPLACE "(.+)" "\${platformdir}/lib\\1.so"
+  OUTPUT_VARIABLE APKTOOLKIT_PC_LIBRARIES)
+list(JOIN APKTOOLKIT_PC_LIBRARIES " " APKTOOLKIT_PC_LIBRARIES)
+configure_file(cmake/apktoolkit.pc.in apktoolkit.pc @ONLY)
+install(FILES ${PROJECT_BINARY_DIR}/apktoolkit.pc DESTINATION ${CMAKE_INSTALL_LIBDIR}/pkgconfig)

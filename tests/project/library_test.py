@@ -1,0 +1,104 @@
+#!/usr/bin/env python3
+"""Installs the library into a folder of its own, builds and runs the example against it as
+examples/README.md shows, and compiles each installed header alone.
+
+Arguments: the build tree, the compiler, and the folder of a good package.
+"""
+
+import concurrent.futures
+import os
+import pathlib
+import re
+import shutil
+import subprocess
+import sys
+import tempfile
+import zipfile
+
+from sources import ROOT, report
+
+MARK = "== next command"
+
+
+def change_manifest(package, out):
+    """A copy of the package with one attribute more in its signed manifest."""
+    with zipfile.ZipFile(package) as source, zipfile.ZipFile(out, "w") as copy:
+        for name in source.namelist():
+            more = b"X: y\r\n" if name == "META-INF/MANIFEST.MF" else b""
+            copy.writestr(name, source.read(name) + more)
+
+
+def prepare(folder, build, package):
+    """The page's folder: what a checkout has, the build tree, and the files that the page names."""
+    shutil.copytree(ROOT / "examples", folder / "examples")
+    (folder / "build").mkdir()
+    (folder / "build/release").symlink_to(build)
+    shutil.copy(package / "base.apk", folder)
+    change_manifest(package / "base.apk", folder / "changed.apk")
+
+
+def shown_commands(page):
+    """The page's commands, each with the lines that it is said to print; None is for any."""
+    for block in re.findall(r"^```\n(\$ .*?)\n```$", page, re.M | re.S):
+        for command in re.split(r"^\$ ", block, flags=re.M)[1:]:
+            command, *lines = command.splitlines()
+            yield command, None if lines == ["..."] else lines
+
+
+def run(commands, folder, compiler):
+    """What each command prints, all of them being lines of one shell."""
+    script = "set -euo pipefail\n" + "\n".join(f"echo '{MARK}'; {command}" for command in commands)
+    environment = {**os.environ, "HOME": str(folder), "CXX": compiler}
+    result = subprocess.run(["bash", "-c", script], cwd=folder, env=environment, text=True,
+                            capture_output=True)
+    printed = [text.splitlines()[1:] for text in result.stdout.split(MARK)[1:]]
+    return printed, [] if result.returncode == 0 else [result.stdout, result.stderr]
+
+
+def page_problems(folder, compiler):
+    # The build tree that is tested is the one that the first command would make.
+    shown = list(shown_commands((ROOT / "examples/README.md").read_text()))[1:]
+    printed, problems = run([command for command, _ in shown], folder, compiler)
+    if len(printed) != len(shown):
+        problems.append(f"{len(printed)} of {len(shown)} commands were run")
+    for (command, expected), lines in zip(shown, printed):
+        if expected is not None and lines != expected:
+            problems += [f"{command} prints:", *lines]
+    return problems
+
+
+def header_problems(folder, compiler):
+    include = folder / "apktoolkit/include/apktoolkit"
+    environment = {**os.environ, "PKG_CONFIG_PATH": folder / "apktoolkit/lib/pkgconfig"}
+    flags = subprocess.run(["pkg-config", "--cflags", "apktoolkit"], env=environment, check=True,
+                           capture_output=True, text=True).stdout.split()
+
+    def compile_alone(header):
+        name = header.relative_to(include)
+        result = subprocess.run(
+            [compiler, "-std=c++17", "-Wall", "-Wextra", "-Werror", *flags, "-fsyntax-only", "-x",
+             "c++", "-"], input=f'#include "{name}"\n', capture_output=True, text=True)
+        return [] if result.returncode == 0 else [f"{name} does not compile alone", result.stderr]
+
+    headers = sorted(include.rglob("*.h"))
+    with concurrent.futures.ThreadPoolExecutor(os.cpu_count()) as pool:
+        found = list(pool.map(compile_alone, headers))
+    return sum(found, [] if headers else ["no header is installed"])
+
+
+def main():
+    build, compiler, package = sys.argv[1:]
+    digest = (pathlib.Path(package) / "digest").read_text().strip()  # as openssl tells it
+    problems = []
+    if digest not in (ROOT / "examples/README.md").read_text():
+        problems.append(f"examples/README.md does not show the signer's digest, {digest}")
+    with tempfile.TemporaryDirectory() as name:
+        folder = pathlib.Path(name).resolve()
+        prepare(folder, pathlib.Path(build), pathlib.Path(package))
+        problems += page_problems(folder, compiler)
+        problems += header_problems(folder, compiler)
+    return report(problems)
+
+
+if __name__ == "__main__":
+    sys.exit(main())
