@@ -46,21 +46,21 @@ def shown_commands(page):
 
 
 def run(commands, folder, compiler):
-    """What each command prints, all of them being lines of one shell."""
+    """What each command prints, all of them being lines of one shell, up to the first that fails."""
     script = "set -euo pipefail\n" + "\n".join(f"echo '{MARK}'; {command}" for command in commands)
     environment = {**os.environ, "HOME": str(folder), "CXX": compiler}
     result = subprocess.run(["bash", "-c", script], cwd=folder, env=environment, text=True,
                             capture_output=True)
     printed = [text.splitlines()[1:] for text in result.stdout.split(MARK)[1:]]
-    return printed, [] if result.returncode == 0 else [result.stdout, result.stderr]
+    if result.returncode == 0:
+        return printed, []
+    return printed, [f"{commands[len(printed) - 1]} fails:", *printed[-1], result.stderr]
 
 
 def page_problems(folder, compiler):
     # The build tree that is tested is the one that the first command would make.
     shown = list(shown_commands((ROOT / "examples/README.md").read_text()))[1:]
     printed, problems = run([command for command, _ in shown], folder, compiler)
-    if len(printed) != len(shown):
-        problems.append(f"{len(printed)} of {len(shown)} commands were run")
     for (command, expected), lines in zip(shown, printed):
         if expected is not None and lines != expected:
             problems += [f"{command} prints:", *lines]
