@@ -96,8 +96,11 @@ bool TaskExists(int pid) {
 int FileHolding(const std::string& text, bool closes_on_exec) {
   const int fd = memfd_create("integrity", MFD_ALLOW_SEALING | (closes_on_exec ? MFD_CLOEXEC : 0U));
   if (fd < 0) return fd;
+  if (pwrite(fd, text.data(), text.size(), 0) < 0) {
+    close(fd);
+    return -1;
+  }
   const ErrnoKeeper keeper;
-  pwrite(fd, text.data(), text.size(), 0);
   fcntl(fd, F_ADD_SEALS, F_SEAL_WRITE | F_SEAL_GROW | F_SEAL_SHRINK | F_SEAL_SEAL);
   return fd;
 }
