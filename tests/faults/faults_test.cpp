@@ -109,8 +109,6 @@ class Installed {
 
 bool IsExit0(const Ending& ending) { return ending.end == End::kExited && ending.value == 0; }
 
-bool IsAbort(const Ending& ending) { return ending.end == End::kKilled && ending.value == SIGABRT; }
-
 // What must come of a run in which the first call of the function fails, the second, and so on.
 using Runs = std::vector<std::string>;
 using Table = std::map<std::string, Runs>;
@@ -208,6 +206,8 @@ TEST(FaultsOfCalls, GetNoLibrarySignedThatIsNotTheManifests) {
 
 // The memory of the sanitizer is its own and does not fail.
 #if !HAS_OWN_MALLOC
+
+bool IsAbort(const Ending& ending) { return ending.end == End::kKilled && ending.value == SIGABRT; }
 
 // Makes each request for memory fail, one in a run. A run ends in the abort of a container, and
 // then keeps what was granted before, which is never less than with an earlier request; or it ends
