@@ -21,15 +21,6 @@ int LoadKey(const std::vector<uint8_t>& block, const pkcs7& record, rsa_context&
 int VerifySignature(const rsa_context& key, const std::vector<uint8_t>& block,
                     const Digests& digests, const uint8_t* signature);
 
-// A key that is wiped and released with its owner.
-struct ScopedRsaKey {
-  rsa_context context = {};
-  ScopedRsaKey() = default;
-  ~ScopedRsaKey() { mpi_free(&context.N, &context.E, nullptr); }
-  ScopedRsaKey(const ScopedRsaKey&) = delete;
-  ScopedRsaKey& operator=(const ScopedRsaKey&) = delete;
-};
-
 // The longest modulus that becomes a manufacturer key, in bytes.
 constexpr uint32_t kLongestKey = 2047;
 
@@ -74,8 +65,8 @@ bool Apk::VerifyCertificate(std::vector<uint8_t>& block, std::vector<uint8_t>& s
     LogError("Unknown certificate type");
     return false;
   }
-  ScopedRsaKey rsa;
-  int result = LoadKey(block, record, rsa.context);
+  rsa_local rsa;
+  int result = LoadKey(block, record, rsa);
   if (result != 0) {
     LogError("RSA could not set key: %X\n", static_cast<unsigned>(result));
     return false;
@@ -84,12 +75,12 @@ bool Apk::VerifyCertificate(std::vector<uint8_t>& block, std::vector<uint8_t>& s
   // no store of trusted issuers.
   const uint8_t* const tbs = record.tbs_data;
   const Digests tbs_digests = ComputeDigests({tbs, tbs + record.tbs_data_length});
-  result = VerifySignature(rsa.context, block, tbs_digests, record.cert_signature);
+  result = VerifySignature(rsa, block, tbs_digests, record.cert_signature);
   if (result != 0) {
     LogError("RSA could not verify certificate: %X\n", static_cast<unsigned>(result));
     return false;
   }
-  result = VerifySignature(rsa.context, block, {sha1, sha256, md5}, record.signed_digest);
+  result = VerifySignature(rsa, block, {sha1, sha256, md5}, record.signed_digest);
   if (result != 0) {
     LogError("RSA could not verify data: %X\n", static_cast<unsigned>(result));
     return false;

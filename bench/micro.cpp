@@ -77,12 +77,11 @@ void Tool(benchmark::State& state) {
   const Bytes sha1 = DigestOf(Digest::kSha1, kSigned), md5 = DigestOf(Digest::kMd5, kSigned);
   const Bytes sha256 = DigestOf(Digest::kSha256, kSigned);
   for (auto _ : state) {
-    rsa_context key = {};
+    rsa_local key;
     rsa_set_key(&key, modulus.data(), nullptr, 65537, static_cast<uint32_t>(modulus.size()));
     if (rsa_pkcs1_verify(&key, sha1.data(), sha256.data(), md5.data(), signature.data()) != 0) {
       state.SkipWithError("does not verify");
     }
-    mpi_free(&key.N, &key.E, nullptr);
   }
 }
 BENCHMARK(Tool)->Name("public/tool")->Arg(1024)->Arg(1536)->Arg(2048)->Arg(3072)->Arg(4096);

@@ -32,13 +32,18 @@ void mpi_init(mpi* X, ...) __attribute__((sentinel));
 // null pointer; empty numbers may be in it.
 void mpi_free(mpi* X, ...) __attribute__((sentinel));
 
-// A number that is empty at first and released when its scope ends.
-struct mpi_local : mpi {
-  mpi_local() { mpi_init(this, nullptr); }
-  ~mpi_local() { mpi_free(this, nullptr); }
-  mpi_local(const mpi_local&) = delete;
-  mpi_local& operator=(const mpi_local&) = delete;
+// Calls mpi_init or mpi_free on the numbers of a record: here, of one that is a number itself.
+inline void mpi_apply(void (*call)(mpi* X, ...), mpi* X) { call(X, nullptr); }
+
+// A record whose numbers are empty at first and released when its scope ends.
+template <typename Record>
+struct mpi_owner : Record {
+  mpi_owner() : Record{} { mpi_apply(mpi_init, this); }
+  ~mpi_owner() { mpi_apply(mpi_free, this); }
+  mpi_owner(const mpi_owner&) = delete;
+  mpi_owner& operator=(const mpi_owner&) = delete;
 };
+using mpi_local = mpi_owner<mpi>;
 
 // Gives X at least `nblimbs` limbs; the new ones are zero. Never shrinks. On failure X is
 // unchanged.

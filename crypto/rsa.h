@@ -1,8 +1,8 @@
 // RSA PKCS#1 v1.5 signature verification (RFC 8017 §8.2.2) on the tool's own integers.
 //
-// A context owns the limbs of its two numbers; its owner may release them with mpi_free. Bytes that
-// are passed in are only read during the call. A signature whose digest does not match, or whose
-// digest cannot be told, is logged at error priority; every other refusal is silent.
+// A context owns the limbs of its two numbers; an rsa_local releases them. Bytes that are passed in
+// are only read during the call. A signature whose digest does not match, or whose digest cannot be
+// told, is logged at error priority; every other refusal is silent.
 #pragma once
 
 #include <cstdint>
@@ -15,6 +15,13 @@ struct rsa_context {
   mpi N;        // the modulus
   mpi E;        // the public exponent
 };
+
+inline void mpi_apply(void (*call)(mpi* X, ...), rsa_context* ctx) {
+  call(&ctx->N, &ctx->E, nullptr);
+}
+
+// A context that is empty at first and released when its scope ends.
+using rsa_local = mpi_owner<rsa_context>;
 
 // Results; 0 is success. The last two are flags on top of a code of the integers.
 inline constexpr int kRsaBadInput = 5;

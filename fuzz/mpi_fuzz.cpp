@@ -11,25 +11,13 @@
 
 namespace {
 
-// A number of the tool, freed with its scope.
-class Number {
- public:
-  Number() { mpi_init(&value_, nullptr); }
-  ~Number() { mpi_free(&value_, nullptr); }
-  Number(const Number&) = delete;
-  Number& operator=(const Number&) = delete;
-
-  mpi* get() { return &value_; }
-  const mpi* get() const { return &value_; }
-
+// A number of the tool.
+struct Number : mpi_local {
   void Set(const std::vector<uint32_t>& limbs, int sign) {
-    Require(mpi_grow(&value_, static_cast<int>(limbs.size())) == 0, "memory");
-    std::copy(limbs.begin(), limbs.end(), value_.p);
-    value_.s = sign;
+    Require(mpi_grow(this, static_cast<int>(limbs.size())) == 0, "memory");
+    std::copy(limbs.begin(), limbs.end(), p);
+    s = sign;
   }
-
- private:
-  mpi value_;
 };
 
 // The same in GMP.
@@ -76,13 +64,13 @@ void Shift(FuzzedDataProvider& input) {
   Number x;
   Fill(input, x);
   const int count = input.ConsumeIntegralInRange(0, 300);
-  Expected expected(x.get());
-  Require(static_cast<size_t>(mpi_msb(x.get())) ==
+  Expected expected(&x);
+  Require(static_cast<size_t>(mpi_msb(&x)) ==
               (mpz_sgn(expected.get()) == 0 ? 0 : mpz_sizeinbase(expected.get(), 2)),
           "mpi_msb");
   mpz_mul_2exp(expected.get(), expected.get(), static_cast<mp_bitcnt_t>(count));
-  Require(mpi_shift_l(x.get(), count) == 0, "mpi_shift_l");
-  RequireEqual(x.get(), expected, "mpi_shift_l shifts");
+  Require(mpi_shift_l(&x, count) == 0, "mpi_shift_l");
+  RequireEqual(&x, expected, "mpi_shift_l shifts");
 }
 
 void AddOrSubtract(FuzzedDataProvider& input) {
@@ -90,23 +78,23 @@ void AddOrSubtract(FuzzedDataProvider& input) {
   Fill(input, a);
   Fill(input, b);
   Fill(input, other);
-  const mpi* const second = input.ConsumeBool() ? b.get() : a.get();
-  mpi* const results[] = {other.get(), a.get(), b.get()};
+  const mpi* const second = input.ConsumeBool() ? &b : &a;
+  mpi* const results[] = {&other, &a, &b};
   mpi* const x = input.PickValueInArray(results);
 
-  Expected abs_a(a.get()), abs_b(second), expected, before(x);
+  Expected abs_a(&a), abs_b(second), expected, before(x);
   mpz_abs(abs_a.get(), abs_a.get());
   mpz_abs(abs_b.get(), abs_b.get());
   if (input.ConsumeBool()) {
     mpz_add(expected.get(), abs_a.get(), abs_b.get());
-    Require(mpi_add_abs(x, a.get(), second) == 0, "mpi_add_abs");
+    Require(mpi_add_abs(x, &a, second) == 0, "mpi_add_abs");
   } else if (mpz_cmp(abs_a.get(), abs_b.get()) < 0) {
-    Require(mpi_sub_abs(x, a.get(), second) == 16, "mpi_sub_abs refuses");
+    Require(mpi_sub_abs(x, &a, second) == 16, "mpi_sub_abs refuses");
     RequireEqual(x, before, "a refused mpi_sub_abs changes nothing");
     return;
   } else {
     mpz_sub(expected.get(), abs_a.get(), abs_b.get());
-    Require(mpi_sub_abs(x, a.get(), second) == 0, "mpi_sub_abs");
+    Require(mpi_sub_abs(x, &a, second) == 0, "mpi_sub_abs");
   }
   RequireEqual(x, expected, "sums and differences");
   Require(x->s == 1, "the sign of a magnitude");
@@ -117,10 +105,10 @@ void MultiplyByLimb(FuzzedDataProvider& input) {
   Fill(input, a);
   Fill(input, other);
   const auto limb = input.ConsumeIntegral<uint32_t>();
-  mpi* const x = input.ConsumeBool() ? other.get() : a.get();
-  Expected expected(a.get());
+  mpi* const x = input.ConsumeBool() ? &other : &a;
+  Expected expected(&a);
   mpz_mul_ui(expected.get(), expected.get(), limb);
-  Require(mpi_mul_int(x, a.get(), limb) == 0, "mpi_mul_int");
+  Require(mpi_mul_int(x, &a, limb) == 0, "mpi_mul_int");
   RequireEqual(x, expected, "mpi_mul_int multiplies");
 }
 
@@ -135,24 +123,24 @@ void MultiplyAndAdd(FuzzedDataProvider& input) {
   d.Set(sum, 1);
   Number factor;
   factor.Set(s, 1);
-  Expected expected(d.get()), product(factor.get());
+  Expected expected(&d), product(&factor);
   mpz_addmul_ui(expected.get(), product.get(), b);
-  mpi_mul_hlp(static_cast<int>(s.size()), s.data(), d.get()->p, b);
-  RequireEqual(d.get(), expected, "mpi_mul_hlp multiplies and adds");
+  mpi_mul_hlp(static_cast<int>(s.size()), s.data(), d.p, b);
+  RequireEqual(&d, expected, "mpi_mul_hlp multiplies and adds");
 }
 
 void Remainder(FuzzedDataProvider& input) {
   Number a, b, other;
   Fill(input, a);
   Fill(input, b, false);
-  mpi* const r = input.ConsumeBool() ? other.get() : a.get();
-  Expected divisor(b.get()), expected(a.get());
+  mpi* const r = input.ConsumeBool() ? &other : &a;
+  Expected divisor(&b), expected(&a);
   if (mpz_sgn(divisor.get()) == 0) {
-    Require(mpi_mod_mpi(r, a.get(), b.get()) == 18, "no division by zero");
+    Require(mpi_mod_mpi(r, &a, &b) == 18, "no division by zero");
     return;
   }
   mpz_mod(expected.get(), expected.get(), divisor.get());
-  Require(mpi_mod_mpi(r, a.get(), b.get()) == 0, "mpi_mod_mpi");
+  Require(mpi_mod_mpi(r, &a, &b) == 0, "mpi_mod_mpi");
   RequireEqual(r, expected, "mpi_mod_mpi divides");
 }
 
@@ -160,7 +148,7 @@ void Remainder(FuzzedDataProvider& input) {
 void SetBelow(Number& number, std::vector<uint32_t> limbs, Expected& m, size_t room) {
   Number whole;
   whole.Set(limbs, 1);
-  Expected value(whole.get());
+  Expected value(&whole);
   mpz_mod(value.get(), value.get(), m.get());
   limbs.assign(std::max(room, limbs.size()), 0);
   size_t count = 0;
@@ -177,7 +165,7 @@ void MontgomeryProduct(FuzzedDataProvider& input) {
   const size_t n = modulus.size();
   Number a, b, m, t;
   m.Set(modulus, 1);
-  Expected expected_m(m.get());
+  Expected expected_m(&m);
 
   // Operands below the modulus; the first with the limb of room that the product needs.
   SetBelow(a, Limbs(input, n), expected_m, n + 1);
@@ -186,7 +174,7 @@ void MontgomeryProduct(FuzzedDataProvider& input) {
 
   uint32_t inverse = 1;  // of the lowest limb; each step doubles the bits that are right
   for (int step = 0; step < 5; ++step) inverse *= 2 - modulus[0] * inverse;
-  Expected expected(a.get()), factor(b.get()), radix;
+  Expected expected(&a), factor(&b), radix;
   mpz_mul(expected.get(), expected.get(), factor.get());
   mpz_setbit(radix.get(), static_cast<mp_bitcnt_t>(32 * n));
   if (mpz_cmp_ui(expected_m.get(), 1) == 0) return;
@@ -194,8 +182,8 @@ void MontgomeryProduct(FuzzedDataProvider& input) {
   mpz_mul(expected.get(), expected.get(), radix.get());
   mpz_mod(expected.get(), expected.get(), expected_m.get());
 
-  mpi_montmul(a.get(), b.get(), m.get(), 0 - inverse, t.get());
-  RequireEqual(a.get(), expected, "mpi_montmul multiplies");
+  mpi_montmul(&a, &b, &m, 0 - inverse, &t);
+  RequireEqual(&a, expected, "mpi_montmul multiplies");
 }
 
 }  // namespace

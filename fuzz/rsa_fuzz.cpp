@@ -91,7 +91,7 @@ Case ReadCase(FuzzedDataProvider& input) {
 extern "C" int LLVMFuzzerTestOneInput(const uint8_t* data, size_t size) {
   FuzzedDataProvider input(data, size);
   const Case c = ReadCase(input);
-  rsa_context context = {};
+  rsa_local context;
   Require(rsa_set_key(&context, c.modulus.data(), nullptr, c.exponent,
                       static_cast<uint32_t>(c.modulus.size())) == 0,
           "a key loads");
@@ -101,6 +101,5 @@ extern "C" int LLVMFuzzerTestOneInput(const uint8_t* data, size_t size) {
                 ExpectedAnswer(c),
             "the answer that the encoded message deserves");
   }
-  mpi_free(&context.N, &context.E, nullptr);
   return 0;
 }

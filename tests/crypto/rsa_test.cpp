@@ -241,7 +241,7 @@ TEST(RsaPkcs1Verify, LengthsOf15And513AreBadInputBeforeAnyArithmetic) {
   const Bytes modulus(513, 0xFF);
   const Bytes signature(513, 0x01);
   for (uint32_t len : {1u, 15u, 513u}) {
-    KeyContext context;
+    rsa_local context;
     ASSERT_EQ(0, rsa_set_key(&context, modulus.data(), nullptr, 3, len));
     FailingMalloc watch;
     EXPECT_EQ(5, Verify(context, signature)) << len;
@@ -250,7 +250,7 @@ TEST(RsaPkcs1Verify, LengthsOf15And513AreBadInputBeforeAnyArithmetic) {
 }
 
 TEST(RsaPkcs1Verify, NegativeLengthIsBadInput) {
-  KeyContext context;
+  rsa_local context;
   context.len = -1;
   EXPECT_EQ(5, Verify(context, Bytes(1)));
 }
@@ -286,7 +286,7 @@ TEST(RsaPkcs1Verify, SignatureIsNotBelowANegativeModulus) {
 }
 
 TEST(RsaPkcs1Verify, EvenModulusReturns20) {
-  KeyContext context;
+  rsa_local context;
   const Bytes modulus(128, 0xFE);
   ASSERT_EQ(0, rsa_set_key(&context, modulus.data(), nullptr, 65537, 128));
   LogCapture log;
@@ -322,7 +322,7 @@ TEST(RsaPkcs1Verify, ReportsEachAllocationThatFailsAndLeaksNothing) {
 
 TEST(RsaPkcs1Verify, NegativeExponentActsAsItsMagnitude) {
   const FixedKey key("rsa-2048-e17");
-  KeyContext context;
+  rsa_local context;
   ASSERT_EQ(0, rsa_set_key(&context, key.modulus.data(), nullptr, 0u - 17u, 256));
   EXPECT_EQ(-1, context.E.s);
   EXPECT_EQ(0, Verify(context, key.Sign(NID_sha256, kSha256)));
@@ -330,7 +330,7 @@ TEST(RsaPkcs1Verify, NegativeExponentActsAsItsMagnitude) {
 
 TEST(RsaPkcs1Verify, EmptyExponentVerifiesNothing) {
   const FixedKey key("rsa-1024");
-  KeyContext context;
+  rsa_local context;
   ASSERT_EQ(0, rsa_set_key(&context, key.modulus.data(), nullptr, 0, 128));
   EXPECT_EQ(0, context.E.n);
   EXPECT_EQ(7, Verify(context, key.Sign(NID_sha1, kSha1)));
@@ -338,7 +338,7 @@ TEST(RsaPkcs1Verify, EmptyExponentVerifiesNothing) {
 
 TEST(RsaSetKey, ReadsTheModulusWithoutItsLeadingZeros) {
   const Bytes modulus = FromHex("0000000102030405060708");
-  KeyContext context;
+  rsa_local context;
   EXPECT_EQ(0, rsa_set_key(&context, modulus.data(), nullptr, 3, Length(modulus)));
   EXPECT_EQ(11, context.len);
   ASSERT_EQ(2, context.N.n);
@@ -352,7 +352,7 @@ TEST(RsaSetKey, ReadsTheModulusWithoutItsLeadingZeros) {
 
 TEST(RsaSetKey, ModulusOfZerosIsOneZeroLimb) {
   const Bytes modulus(16);
-  KeyContext context;
+  rsa_local context;
   EXPECT_EQ(0, rsa_set_key(&context, modulus.data(), nullptr, 3, 16));
   ASSERT_EQ(1, context.N.n);
   EXPECT_EQ(0u, context.N.p[0]);
@@ -360,7 +360,7 @@ TEST(RsaSetKey, ModulusOfZerosIsOneZeroLimb) {
 }
 
 TEST(RsaSetKey, LengthOfZeroGivesAnEmptyKeyThatVerifiesNothing) {
-  KeyContext context;
+  rsa_local context;
   context.len = 128;
   const Bytes modulus(128, 0xFF);
   EXPECT_EQ(0, rsa_set_key(&context, modulus.data(), nullptr, 3, 0));
@@ -371,7 +371,7 @@ TEST(RsaSetKey, LengthOfZeroGivesAnEmptyKeyThatVerifiesNothing) {
 }
 
 TEST(RsaSetKey, NullModulusGivesAnEmptyKeyThatVerifiesNothing) {
-  KeyContext context;
+  rsa_local context;
   EXPECT_EQ(0, rsa_set_key(&context, nullptr, nullptr, 3, 128));
   EXPECT_EQ(128, context.len);
   EXPECT_EQ(0, context.N.n);
@@ -381,7 +381,7 @@ TEST(RsaSetKey, NullModulusGivesAnEmptyKeyThatVerifiesNothing) {
 
 TEST(RsaSetKey, DiscardsWhatTheContextHeld) {
   const Bytes modulus(16, 0xFF);
-  KeyContext context;
+  rsa_local context;
   context.N = {-1, 7, nullptr};
   context.E = {-1, 7, nullptr};
   EXPECT_EQ(0, rsa_set_key(&context, modulus.data(), nullptr, 0, 16));
@@ -397,7 +397,7 @@ TEST(RsaSetKey, ReadsTheExponentValueAsASignedNumber) {
                                                        {0x80000001, 0x7fffffff, -1},
                                                        {0xffffffff, 1, -1}};
   for (const auto& [value, magnitude, sign] : cases) {
-    KeyContext context;
+    rsa_local context;
     EXPECT_EQ(0, rsa_set_key(&context, modulus.data(), nullptr, value, 16));
     ASSERT_EQ(1, context.E.n);
     EXPECT_EQ(magnitude, context.E.p[0]);
@@ -411,7 +411,7 @@ TEST(RsaSetKey, ReadsExactlyAsManyBytesOfTheExponentAsTheModulusHas) {
   const auto exponent = std::make_unique<uint8_t[]>(128);
   exponent[125] = 1;
   exponent[127] = 1;
-  KeyContext context;
+  rsa_local context;
   EXPECT_EQ(0, rsa_set_key(&context, key.modulus.data(), exponent.get(), 3, 128));
   ASSERT_EQ(1, context.E.n);
   EXPECT_EQ(65537u, context.E.p[0]);
@@ -427,7 +427,7 @@ TEST(RsaSetKey, WithoutMemoryForModulusOrExponentBytesReturnsNine) {
   const Bytes modulus(128, 0xFF);
   const Bytes exponent(128, 0x03);
   for (int call : {1, 2}) {
-    KeyContext context;
+    rsa_local context;
     FailingMalloc failing(call);
     EXPECT_EQ(9, rsa_set_key(&context, modulus.data(), exponent.data(), 0, 128));
     EXPECT_TRUE(failing.failed());
@@ -436,7 +436,7 @@ TEST(RsaSetKey, WithoutMemoryForModulusOrExponentBytesReturnsNine) {
     EXPECT_EQ(0, context.N.n);
     EXPECT_EQ(0, context.E.n);
   }
-  KeyContext context;
+  rsa_local context;
   FailingMalloc failing(3);
   EXPECT_EQ(0, rsa_set_key(&context, modulus.data(), exponent.data(), 0, 128));
   EXPECT_FALSE(failing.failed());
@@ -444,7 +444,7 @@ TEST(RsaSetKey, WithoutMemoryForModulusOrExponentBytesReturnsNine) {
 
 TEST(RsaSetKey, WithoutMemoryForTheExponentValueLeavesItEmpty) {
   const Bytes modulus(128, 0xFF);
-  KeyContext context;
+  rsa_local context;
   FailingMalloc failing(2);
   EXPECT_EQ(0, rsa_set_key(&context, modulus.data(), nullptr, 65537, 128));
   EXPECT_TRUE(failing.failed());

@@ -13,14 +13,6 @@
 #include "support/der.h"
 #include "support/keys.h"
 
-// A context that releases its numbers.
-struct KeyContext : rsa_context {
-  KeyContext() : rsa_context{} { mpi_init(&N, &E, nullptr); }
-  ~KeyContext() { mpi_free(&N, &E, nullptr); }
-  KeyContext(const KeyContext&) = delete;
-  KeyContext& operator=(const KeyContext&) = delete;
-};
-
 inline Bytes BigEndian(const BIGNUM* number, size_t length) {
   Bytes bytes(length);
   EXPECT_TRUE(BN_bn2bin_padded(bytes.data(), length, number));
@@ -70,7 +62,7 @@ struct FixedKey {
   RSA* rsa;
   Bytes modulus;
   uint32_t exponent;
-  KeyContext context;
+  rsa_local context;
 };
 
 // A key of a size that libcrypto does not make: two primes from GMP, exponent 65537.
@@ -100,7 +92,7 @@ struct SmallKey {
   mpz_class n;
   mpz_class d;
   Bytes modulus;
-  KeyContext context;
+  rsa_local context;
 };
 
 // A block of type 1 of `size` bytes.

@@ -57,9 +57,6 @@ class Key {
                           static_cast<uint32_t>(modulus_.size())),
               0);
   }
-  ~Key() { mpi_free(&context_.N, &context_.E, nullptr); }
-  Key(const Key&) = delete;
-  Key& operator=(const Key&) = delete;
 
   size_t size() const { return modulus_.size(); }
   // Whether the exponent is one that the tool can hold.
@@ -72,7 +69,7 @@ class Key {
 
  private:
   Bytes modulus_;
-  rsa_context context_ = {};
+  rsa_local context_;
   bool is_usable_ = false;
 };
 
