@@ -17,6 +17,8 @@ struct mpi {
   uint32_t* p;  // the magnitude, least significant limb first; null when `n` is 0
 };
 
+inline constexpr int kMpiLimbBits = 32;
+
 // Results of the operations; 0 is success.
 inline constexpr int kMpiNoMemory = 1;
 inline constexpr int kMpiBadModulus = 4;

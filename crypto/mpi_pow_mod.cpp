@@ -1,0 +1,112 @@
+// The power of a number modulo another, by Montgomery products and a sliding window.
+#include "crypto/mpi.h"
+#include "crypto/wrapping.h"
+
+namespace {
+
+// The window table of an exponentiation; its index has up to 6 bits.
+constexpr int kWindowTableSize = 64;
+
+// What the Montgomery products of one exponentiation share.
+struct montgomery {
+  const mpi* N;
+  uint32_t mm;
+  mpi_local T;
+  void multiply(mpi* A, const mpi* B) { mpi_montmul(A, B, N, mm, &T); }
+};
+
+uint32_t montgomery_constant(uint32_t m0);
+int window_size(int bits);
+int fill_window(mpi_local* W, int w, montgomery* m);
+void raise(mpi* X, const mpi* E, const mpi_local* W, int w, montgomery* m);
+
+}  // namespace
+
+int mpi_pow_mod(mpi* X, const mpi* A, const mpi* E, const mpi* N) {
+  const mpi_local zero;
+  if (mpi_compare(N, &zero) < 0 || N->n == 0 || N->p[0] % 2 == 0) return kMpiBadModulus;
+  const int w = window_size(mpi_msb(E));
+  montgomery m = {N, montgomery_constant(N->p[0]), {}};
+  mpi_local W[kWindowTableSize];
+  mpi_local RR;
+  mpi_local one;
+  if (const int result = mpi_grow(X, N->n + 1)) return result;
+  if (const int result = mpi_grow(&W[1], N->n + 1)) return result;
+  if (const int result = mpi_grow(&m.T, 2 * (N->n + 1))) return result;
+  if (const int result = mpi_grow(&one, 1)) return result;
+  if (const int result = mpi_grow(&RR, 1)) return result;
+  one.p[0] = 1;
+  RR.p[0] = 1;
+  // A product with R^2 mod N, R = 2^(32 * N.n), takes a number into Montgomery form, one with 1
+  // takes it out again.
+  if (const int result = mpi_shift_l(&RR, 2 * kMpiLimbBits * N->n)) return result;
+  if (const int result = mpi_mod_mpi(&RR, &RR, N)) return result;
+  const bool reduced = mpi_compare(A, N) < 0;
+  if (const int result = reduced ? mpi_assign(&W[1], A) : mpi_mod_mpi(&W[1], A, N)) return result;
+  m.multiply(&W[1], &RR);
+  if (const int result = mpi_assign(X, &RR)) return result;
+  m.multiply(X, &one);
+  if (const int result = fill_window(W, w, &m)) return result;
+  raise(X, E, W, w, &m);
+  m.multiply(X, &one);
+  return 0;
+}
+
+namespace {
+
+// -1 / m0 mod 2^32 for an odd m0: its inverse modulo 2^4, then Newton steps that double the bits.
+WRAPS_ON_PURPOSE uint32_t montgomery_constant(uint32_t m0) {
+  uint32_t x = m0 + ((m0 * 2 + 4) & 8);
+  for (int bits = kMpiLimbBits; bits >= 8; bits /= 2) x *= 2 - m0 * x;
+  return 0 - x;
+}
+
+// How many bits of an exponent of `bits` bits one product takes in. Deliberate: there is no window
+// of 2; exponents as short as that have few set bits in practice, and it would gain nothing.
+int window_size(int bits) {
+  return bits > 671 ? 6 : bits > 239 ? 5 : bits > 79 ? 4 : bits > 23 ? 3 : 1;
+}
+
+// From W[1] makes the powers W[i] = W[1]^i whose index has w bits, highest bit set: a window begins
+// with a set bit, so no other is ever needed.
+int fill_window(mpi_local* W, int w, montgomery* m) {
+  if (w == 1) return 0;
+  const int j = 1 << (w - 1);
+  if (const int result = mpi_grow(&W[j], m->N->n + 1)) return result;
+  if (const int result = mpi_assign(&W[j], &W[1])) return result;
+  for (int i = 1; i < w; ++i) m->multiply(&W[j], &W[j]);
+  for (int i = j + 1; i < 2 * j; ++i) {
+    if (const int result = mpi_grow(&W[i], m->N->n + 1)) return result;
+    if (const int result = mpi_assign(&W[i], &W[i - 1])) return result;
+    m->multiply(&W[i], &W[1]);
+  }
+  return 0;
+}
+
+// Makes W[1]^E of X, which is 1 in Montgomery form, by a sliding window of w bits.
+void raise(mpi* X, const mpi* E, const mpi_local* W, int w, montgomery* m) {
+  int nbits = 0;
+  int wbits = 0;
+  for (int i = mpi_msb(E) - 1; i >= 0; --i) {
+    const int bit = static_cast<int>(E->p[i / kMpiLimbBits] >> (i % kMpiLimbBits) & 1);
+    if (bit == 0 && nbits == 0) {
+      m->multiply(X, X);
+      continue;
+    }
+    ++nbits;
+    wbits |= bit << (w - nbits);
+    if (nbits < w) continue;
+    for (int k = 0; k < w; ++k) m->multiply(X, X);
+    m->multiply(X, &W[wbits]);
+    nbits = 0;
+    wbits = 0;
+  }
+  // A window that the exponent's end cut short.
+  for (; nbits > 0; --nbits) {
+    m->multiply(X, X);
+    wbits <<= 1;
+    if ((wbits >> w & 1) != 0) m->multiply(X, &W[1]);
+  }
+}
+
+}  // namespace
