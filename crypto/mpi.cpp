@@ -294,37 +294,38 @@ WRAPS_ON_PURPOSE void subtract_with_borrow(int count, const uint32_t* s, uint32_
   for (int i = count; borrow != 0; ++i) borrow = d[i]-- == 0;
 }
 
-// Adds s * b + c to d over `kCount` limbs, a power of two, without a loop; returns the carry.
+// Adds s * b + c to d over `kCount` limbs; returns the carry. A vector holds a limb in each of its
+// lanes, and the four half products of all of them are made at once. They are then put together so
+// that no sum wraps: (2^16 - 1)^2, the greatest half product, leaves room for a half limb more.
 template <int kCount>
-WRAPS_ON_PURPOSE __attribute__((always_inline)) inline uint32_t multiply_add(const uint32_t* s,
-                                                                             uint32_t* d,
-                                                                             uint32_t b,
-                                                                             uint32_t c) {
-  if constexpr (kCount > 1) {
-    constexpr int kHalf = kCount / 2;
-    return multiply_add<kHalf>(s + kHalf, d + kHalf, b, multiply_add<kHalf>(s, d, b, c));
-  } else {
-    const uint32_t b1 = b >> 16;
-    const uint32_t b0 = b & 0xFFFF;
-    const uint32_t s1 = *s >> 16;
-    const uint32_t s0 = *s & 0xFFFF;
-    const uint32_t rx = s0 * b1;
-    const uint32_t ry = s1 * b0;
-    uint32_t r0 = s0 * b0;
-    uint32_t r1 = s1 * b1;
-    r1 += rx >> 16;
-    r1 += ry >> 16;
-    const auto add = [&r0, &r1 ](uint32_t addend) __attribute__((always_inline)) WRAPS_ON_PURPOSE {
-      r0 += addend;
-      r1 += r0 < addend;
-    };
-    add(rx << 16);
-    add(ry << 16);
-    add(c);
-    add(*d);
-    *d = r0;
-    return r1;
+WRAPS_ON_PURPOSE uint32_t multiply_add(const uint32_t* s, uint32_t* d, uint32_t b, uint32_t c) {
+  constexpr int kLanes = std::min(kCount, 4);
+  typedef uint32_t lanes __attribute__((vector_size(kLanes * kLimbBytes)));
+  const uint32_t b1 = b >> 16;
+  const uint32_t b0 = b & 0xFFFF;
+#pragma GCC unroll 4
+  for (int i = 0; i < kCount; i += kLanes) {
+    lanes limbs;
+    memcpy(&limbs, s + i, sizeof(limbs));
+    const lanes s1 = limbs >> 16;
+    const lanes s0 = limbs & 0xFFFF;
+    const lanes r0 = s0 * b0;
+    const lanes rx = s0 * b1 + (r0 >> 16);
+    const lanes ry = s1 * b0 + (rx & 0xFFFF);
+    const lanes r1 = s1 * b1 + (rx >> 16) + (ry >> 16);
+    const lanes r = ry << 16 | (r0 & 0xFFFF);
+    uint32_t low[kLanes], high[kLanes];
+    memcpy(low, &r, sizeof(low));
+    memcpy(high, &r1, sizeof(high));
+#pragma GCC unroll 4
+    for (int k = 0; k < kLanes; ++k) {
+      low[k] += c;
+      c = high[k] + (low[k] < c);
+      d[i + k] += low[k];
+      c += d[i + k] < low[k];
+    }
   }
+  return c;
 }
 
 // X = abs(X) mod abs(B) with the sign of X, for abs(X) >= abs(B) > 0. Long division by 32-bit
