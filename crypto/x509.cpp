@@ -5,7 +5,8 @@
 
 namespace {
 
-// Bytes of the certificate that are still to be read.
+// Bytes of the certificate that are still to be read. Deliberate: what is left of them when the
+// last element that is known has been read is not looked at.
 struct Range {
   const uint8_t* start;
   size_t length;
@@ -67,6 +68,7 @@ bool ReadExtensionValue(Range extension, bool* critical, Range* value);
 bool ParseKeyUsage(Range value, x509_certificate* cert);
 bool ParseSubjectAltName(Range value, x509_certificate* cert);
 bool ParseIssuerAltName(Range value, x509_certificate* cert);
+bool ParseAltName(Range value, uint32_t present, x509_name* name, x509_certificate* cert);
 bool ParseBasicConstraints(Range value, x509_certificate* cert);
 int x509_parse_ext_alt_name(x509_name* name, const uint8_t* buf, size_t len);
 bool KeepAltName(const asn1_hdr& hdr, x509_name* name);
@@ -104,6 +106,13 @@ constexpr KnownExtension kExtensions[] = {
     {18, ParseIssuerAltName},
     {19, ParseBasicConstraints},
 };
+
+// The tags of the alternative names that are kept (RFC 5280 §4.2.1.6).
+constexpr uint32_t kRfc822Name = 1;
+constexpr uint32_t kDnsName = 2;
+constexpr uint32_t kUniformResourceIdentifier = 6;
+constexpr uint32_t kIpAddress = 7;
+constexpr uint32_t kRegisteredId = 8;
 
 }  // namespace
 
@@ -211,6 +220,7 @@ bool IsType(const asn1_oid& oid, const KnownAttribute& attribute) {
          memcmp(oid.oid, attribute.arcs, attribute.arc_count * sizeof(uint32_t)) == 0;
 }
 
+// Deliberate: of the values that are kept only the e-mail address may hold a NUL.
 bool KeepAttribute(const asn1_oid& type, const asn1_hdr& value, x509_name* name) {
   if (IsType(type, kEmailAddress)) {
     name->email = value.payload;
@@ -285,6 +295,7 @@ bool ParsePublicKeyInfo(Range* tbs, x509_certificate* cert) {
 
 int ParseOptionalFields(Range tbs, x509_certificate* cert) {
   constexpr uint32_t kExtensionsTag = 3;
+  // Deliberate: a v1 certificate, which has no such fields, may have them, and they are not read.
   if (tbs.length == 0 || cert->version == 0) return 0;
   asn1_hdr hdr;
   if (!Next(&tbs, &hdr) || hdr.class_ != kAsn1Context) return -5;
@@ -347,17 +358,18 @@ bool ParseKeyUsage(Range value, x509_certificate* cert) {
 }
 
 bool ParseSubjectAltName(Range value, x509_certificate* cert) {
-  asn1_hdr hdr;
-  if (!NextUniversal(&value, kAsn1Sequence, &hdr)) return false;
-  cert->extensions_present |= kX509SubjectAltName;
-  return x509_parse_ext_alt_name(&cert->subject, hdr.payload, hdr.length) == 0;
+  return ParseAltName(value, kX509SubjectAltName, &cert->subject, cert);
 }
 
 bool ParseIssuerAltName(Range value, x509_certificate* cert) {
+  return ParseAltName(value, kX509IssuerAltName, &cert->issuer, cert);
+}
+
+bool ParseAltName(Range value, uint32_t present, x509_name* name, x509_certificate* cert) {
   asn1_hdr hdr;
   if (!NextUniversal(&value, kAsn1Sequence, &hdr)) return false;
-  cert->extensions_present |= kX509IssuerAltName;
-  return x509_parse_ext_alt_name(&cert->issuer, hdr.payload, hdr.length) == 0;
+  cert->extensions_present |= present;
+  return x509_parse_ext_alt_name(name, hdr.payload, hdr.length) == 0;
 }
 
 bool ParseBasicConstraints(Range value, x509_certificate* cert) {
@@ -394,17 +406,17 @@ int x509_parse_ext_alt_name(x509_name* name, const uint8_t* buf, size_t len) {
 
 bool KeepAltName(const asn1_hdr& hdr, x509_name* name) {
   switch (hdr.tag) {
-    case 1:
+    case kRfc822Name:
       return KeepText(hdr, &name->alt_email, &name->alt_email_length);
-    case 2:
+    case kDnsName:
       return KeepText(hdr, &name->dns, &name->dns_length);
-    case 6:
+    case kUniformResourceIdentifier:
       return KeepText(hdr, &name->uri, &name->uri_length);
-    case 7:
+    case kIpAddress:
       name->ip = hdr.payload;
       name->ip_length = hdr.length;
       return true;
-    case 8:
+    case kRegisteredId:
       return asn1_parse_oid(hdr.payload, hdr.length, &name->rid) == 0;
     default:
       return true;
@@ -419,6 +431,7 @@ bool KeepText(const asn1_hdr& hdr, const uint8_t** text, uint64_t* length) {
   return good;
 }
 
+// Deliberate: the AlgorithmIdentifier here is not compared with the tbsCertificate's.
 int ParseSignature(Range certificate, x509_certificate* cert) {
   if (!ParseAlgorithm(&certificate, &cert->signature_algorithm_oid,
                       &cert->signature_algorithm_params_oid)) {
