@@ -283,6 +283,14 @@ TEST(Asn1ParseOid, LargeFirstValueIsSplitBeforeItIsCut) {
   EXPECT_EQ(Arcs(oid), (std::vector<uint32_t>{2, 0}));
 }
 
+TEST(Asn1ParseOid, FirstValueOf2To32IsSplitAsItIs) {
+  // In sevens 10000 and four zeros; 2^32 - 80 = 0xffffffb0.
+  const Bytes contents = FromHex("90 80 80 80 00");
+  asn1_oid oid;
+  EXPECT_EQ(asn1_parse_oid(contents.data(), contents.size(), &oid), 0);
+  EXPECT_EQ(Arcs(oid), (std::vector<uint32_t>{2, 0xffffffb0}));
+}
+
 TEST(Asn1ParseOid, ArcKeepsItsLow32Bits) {
   // Ten octets of seven ones, but for the last: 2^70 - 1 less 1.
   const Bytes contents = FromHex("2a ff ff ff ff ff ff ff ff ff 7e");
@@ -375,6 +383,19 @@ TEST(Asn1OidToStr, TextThatDoesNotFitMayBeCutWithinAnArc) {
 TEST(Asn1OidToStr, TextThatJustFitsIsWhole) {
   EXPECT_EQ(Text(OidOf({1, 2, 840}), 8), "1.2.840");
   EXPECT_EQ(Text(OidOf({1, 2, 840}), 7), "1.2.84");
+}
+
+TEST(Asn1OidToStr, EverySizeOfTheBufferHoldsTheStartOfTheText) {
+  const std::string whole = "1.2.840.113549.1.1.1";
+  const asn1_oid oid = OidOf({1, 2, 840, 113549, 1, 1, 1});
+  for (size_t size = 1; size <= whole.size() + 2; ++size) {
+    std::string text(size, 'x');
+    text += '!';
+    asn1_oid_to_str(&oid, text.data(), size);
+    EXPECT_EQ(text.c_str(), whole.substr(0, size - 1));
+    EXPECT_EQ(text[size - 1], '\0');
+    EXPECT_EQ(text[size], '!');
+  }
 }
 
 TEST(Asn1OidToStr, NothingIsWrittenWithoutRoom) {

@@ -99,6 +99,18 @@ TEST(MpiMontmul, TakesAFactorShorterOrLongerThanTheModulus) {
   }
 }
 
+TEST(MpiMontmul, OfAProductThatTheModulusDividesIsZero) {
+  const std::pair<uint32_t, uint32_t> cases[] = {{3, 5}, {5, 3}, {0, 7}, {7, 0}, {0, 0}};
+  const Number N({15});
+  for (const auto& [a, b] : cases) {
+    Number A({a, 0});
+    const Number B({b});
+    Number T(Limbs(4));
+    mpi_montmul(&A, &B, &N, MontgomeryConstant(15), &T);
+    EXPECT_EQ(0, Value(A)) << a << " * " << b;
+  }
+}
+
 // With N = 2^32 - 1 the product is A * B mod N, as R = 1 mod N.
 TEST(MpiMontmul, SubtractsAlsoWhereTheProductIsBelowTheModulus) {
   const Number N({UINT32_MAX});

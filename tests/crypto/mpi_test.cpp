@@ -6,6 +6,7 @@
 
 #include <climits>
 #include <cstdlib>
+#include <tuple>
 #include <utility>
 #include <vector>
 
@@ -15,23 +16,6 @@
 namespace {
 
 constexpr int kRounds = 150000;
-
-// Which arguments of an operation X op= A, B are the same number.
-enum Alias { kNone, kXIsA, kXIsB, kAIsB, kAllOne, kAliases };
-
-struct Aliased {
-  Number x, a, b;
-  mpi *X, *A, *B;
-
-  Aliased(int alias, Operands* operands, const Limbs& first, const Limbs& second) {
-    Set(&x, operands->Magnitude(6), operands->Sign());
-    Set(&a, first, operands->Sign());
-    Set(&b, second, operands->Sign());
-    A = &a;
-    B = alias == kAIsB || alias == kAllOne ? A : &b;
-    X = alias == kXIsA || alias == kAllOne ? A : alias == kXIsB ? B : &x;
-  }
-};
 
 TEST(FailingMalloc, SeesBytesThatAreNotWiped) {
   FailingMalloc watch;
@@ -160,6 +144,22 @@ TEST(MpiCompare, OrdersByMagnitudeAndBySign) {
     ASSERT_EQ(cmp(abs(a), abs(b)) > 0, mpi_compare_abs(&A, &B) > 0);
     ASSERT_EQ(a < b, mpi_compare(&A, &B) < 0) << a << ' ' << b;
     ASSERT_EQ(a > b, mpi_compare(&A, &B) > 0) << a << ' ' << b;
+  }
+}
+
+TEST(MpiCompare, ZeroLiesBetweenTheNegativeAndThePositiveNumbers) {
+  for (const Limbs& zero : {Limbs{}, Limbs{0}, Limbs{0, 0}}) {
+    for (const int sign : {1, -1}) {
+      const Number nothing(zero, sign);
+      for (const Limbs& limbs : {Limbs{1}, Limbs{UINT32_MAX}, Limbs{0, 1}}) {
+        const Number positive(limbs);
+        const Number negative(limbs, -1);
+        EXPECT_GT(mpi_compare(&nothing, &negative), 0);
+        EXPECT_LT(mpi_compare(&negative, &nothing), 0);
+        EXPECT_LT(mpi_compare(&nothing, &positive), 0);
+        EXPECT_GT(mpi_compare(&positive, &nothing), 0);
+      }
+    }
   }
 }
 
@@ -325,6 +325,19 @@ TEST(MpiMulInt, MultipliesByOneLimb) {
   }
 }
 
+TEST(MpiMulInt, GrowsToOneLimbMoreThanTheFactorHasUnlessTheOtherIsZero) {
+  const Number A({1, 2, 3, 0});
+  const Number empty;
+  const std::tuple<const mpi*, uint32_t, int> cases[] = {
+      {&A, 1, 4}, {&A, 0, 3}, {&empty, 1, 1}, {&empty, 0, 1}};
+  for (const auto& [factor, b, limbs] : cases) {
+    Number X;
+    EXPECT_EQ(0, mpi_mul_int(&X, factor, b));
+    EXPECT_EQ(limbs, X.n) << b;
+    EXPECT_EQ(mpz_class(Value(*factor) * b), Value(X));
+  }
+}
+
 TEST(MpiMulHlp, AddsAProductAndCarriesOn) {
   Operands operands;
   for (int round = 0; round < kRounds; ++round) {
@@ -340,92 +353,6 @@ TEST(MpiMulHlp, AddsAProductAndCarriesOn) {
     mpi_mul_hlp(static_cast<int>(count), s.data(), d.data(), b);
     ASSERT_EQ(sum, Magnitude(d.size(), d.data())) << count << " limbs";
   }
-}
-
-// Dividends that are arbitrary, or just beside a multiple of the divisor, where estimates fail.
-TEST(MpiModMpi, IsTheNonNegativeRemainder) {
-  Operands operands;
-  for (int round = 0; round < kRounds; ++round) {
-    const Limbs divisor = operands.Magnitude(8);
-    Limbs dividend = operands.Magnitude(16);
-    const mpz_class b = Magnitude(divisor.size(), divisor.data());
-    if (b == 0) continue;
-    if (round % 2 == 0) {
-      const mpz_class near = b * Magnitude(dividend.size(), dividend.data()) - operands.Below(3);
-      if (near >= 0) dividend = LimbsOf(near + operands.Below(2) * (b - 1));
-    }
-    Aliased o(round % kAliases, &operands, dividend, divisor);
-    if (Value(*o.B) == 0) continue;
-    if (o.A != o.B) o.B->s = 1;
-    const mpz_class a = Value(*o.A);
-    const mpz_class modulus = abs(Value(*o.B));
-    mpz_class expected;
-    mpz_mod(expected.get_mpz_t(), a.get_mpz_t(), modulus.get_mpz_t());
-    ASSERT_EQ(0, mpi_mod_mpi(o.X, o.A, o.B));
-    ASSERT_EQ(expected, Value(*o.X)) << a << " mod " << modulus;
-    ASSERT_EQ(1, o.X->s);
-  }
-}
-
-TEST(MpiModMpi, OfAZeroDivisorReturnsEighteen) {
-  Number A({1});
-  Number R({9});
-  Number empty;
-  Number zero({0, 0});
-  EXPECT_EQ(18, mpi_mod_mpi(&R, &A, &empty));
-  EXPECT_EQ(18, mpi_mod_mpi(&R, &A, &zero));
-  EXPECT_EQ(9, Value(R));
-}
-
-TEST(MpiModMpi, OfANegativeNumberIsNotNegativeAndBelowTheDivisor) {
-  Number B({7});
-  Number R;
-  for (uint32_t a = 0; a < 50; ++a) {
-    Number A({a}, -1);
-    EXPECT_EQ(0, mpi_mod_mpi(&R, &A, &B));
-    EXPECT_EQ((7 - a % 7) % 7, Value(R).get_ui());
-  }
-}
-
-TEST(MpiModMpi, DoesNotLookAtTheDivisorsSign) {
-  Number A({0, 5}, -1);
-  Number B({7}, -1);
-  Number R;
-  EXPECT_EQ(0, mpi_mod_mpi(&R, &A, &B));
-  EXPECT_EQ(1, Value(R));  // 2^32 = 4 mod 7, 5 * 4 = 6 mod 7
-}
-
-// A shift that left the divisor's highest bit clear would make the digit's estimate wrap here.
-TEST(MpiModMpi, EndsAtOnceForADivisorOfThirtyOneBitsAtTheTop) {
-  Number A({0x8712b8bc, 0xffffffff, 0x4000fffe});
-  Number B({0x00000001, 0x4000ffff});
-  Number R;
-  EXPECT_EQ(0, mpi_mod_mpi(&R, &A, &B));
-  EXPECT_EQ(mpz_class(Value(A) % Value(B)), Value(R));
-}
-
-TEST(MpiModMpi, EndsAtOnceForEveryTopLimb) {
-  Number R;
-  for (int bit = 0; bit < 32; ++bit) {
-    for (uint32_t low : {0u, 1u, 0xffffu, 0xffff0000u, 0xffffffffu}) {
-      const uint32_t top = (1u << bit) | (0xffffu >> (31 - bit) / 2);
-      Number B({low, top, 0});
-      Number A({0x8712b8bc, 0xffffffff, top - 1, 0});
-      EXPECT_EQ(0, mpi_mod_mpi(&R, &A, &B));
-      EXPECT_EQ(mpz_class(Value(A) % Value(B)), Value(R));
-    }
-  }
-}
-
-TEST(MpiModMpi, OfTwoToThe8192ForAModulusOf128Limbs) {
-  Operands operands;
-  Limbs limbs(128);
-  for (uint32_t& limb : limbs) limb = operands.Limb() | 1;
-  Number N(limbs);
-  Number RR({1});
-  EXPECT_EQ(0, mpi_shift_l(&RR, 8192));
-  EXPECT_EQ(0, mpi_mod_mpi(&RR, &RR, &N));
-  EXPECT_EQ(mpz_class(PowerOfTwo(8192) % Value(N)), Value(RR));
 }
 
 TEST(Mpi, ReportsEachAllocationThatFails) {

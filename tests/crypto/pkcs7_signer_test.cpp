@@ -28,6 +28,12 @@ const Bytes& Sha256Algorithm() {
   return algorithm;
 }
 
+// A block of indefinite lengths that ends in these bytes, which follow its certificate.
+Bytes BlockEndingInSigners(const Bytes& signers) {
+  return BlockEndingIn(
+      Concat({der::Context(0, *WithRsaKey(Bytes(64, 0x77), {3}).certificates), signers}));
+}
+
 // Whether all that lies in the block according to the record does.
 bool Inside(const Bytes& block, const pkcs7& record) {
   const auto inside = [&](const uint8_t* value, size_t length) {
@@ -69,6 +75,37 @@ TEST(ProcessCertSigner, SignersThatWouldStartBeyondTheEndGiveTheUnreadableLine) 
   const ProcessedBlock processed(BlockEndingIn(certificates));
   EXPECT_EQ(processed.result, 1);
   EXPECT_EQ(processed.output, std::string(kUnreadable) + kSignerTrailer);
+}
+
+// Each of these elements may run on beyond what holds it, but not beyond the block.
+TEST(ProcessCertSigner, SignersAndTheirFirstMayEndWithTheBlock) {
+  const Bytes signer = der::Sequence({der::Integer(1), der::Sequence({}), Sha256Algorithm(),
+                                      AlgorithmIdentifier("1.2.3"), der::OctetString(Bytes(8, 1))});
+  for (const Bytes& set : {der::Set({signer}), Concat({{0x31, 0x00}, signer})}) {
+    Bytes block = BlockEndingInSigners(set);
+    EXPECT_EQ(ProcessedBlock(block).result, 0);
+    const bool is_empty = set[1] == 0;
+    ++block[block.size() - (is_empty ? signer : set).size() + 1];
+    const ProcessedBlock processed(block);
+    EXPECT_EQ(processed.result, 1);
+    EXPECT_EQ(processed.output, std::string(kUnreadable) + kSignerTrailer);
+  }
+}
+
+TEST(ProcessCertSigner, VersionAndIssuerMayEndWithTheBlock) {
+  // A signer of no contents, so that the digestAlgorithm is missed once the two were read: a
+  // version and an issuer that end with the block, and either of them a byte longer.
+  const std::pair<const char*, const char*> cases[] = {
+      {"31 00 30 00 02 03 01 02 03 30 00", kNoAlgorithm},
+      {"31 00 30 00 02 04 01 02 03 30 00", kUnreadable},
+      {"31 00 30 00 02 01 01 30 02 05 00", kNoAlgorithm},
+      {"31 00 30 00 02 01 01 30 03 05 00", kUnreadable},
+  };
+  for (const auto& [digits, line] : cases) {
+    const ProcessedBlock processed(BlockEndingInSigners(FromHex(digits)));
+    EXPECT_EQ(processed.result, 1);
+    EXPECT_EQ(processed.output, std::string(line) + kSignerTrailer) << digits;
+  }
 }
 
 TEST(ProcessCertSigner, MalformedDigestAlgorithmGivesItsLine) {
@@ -146,6 +183,20 @@ TEST(ProcessCertSigner, LastElementsAreComparedWithTheOffsetOfTheDigestAlgorithm
   EXPECT_EQ(too_long.output, std::string(kUnreadable) + kSignerTrailer);
 }
 
+TEST(ProcessCertSigner, DigestEncryptionAlgorithmIsComparedWithTheSameOffset) {
+  const Bytes up_to_algorithm =
+      BlockEndingInSigners(Concat({FromHex("31 80 30 14 02 01 01 30 80"), Sha256Algorithm()}));
+  const size_t most = up_to_algorithm.size() - 4;  // less the element's own header
+  for (const size_t length : {most, most + 1}) {
+    const Bytes algorithm = der::Element(der::kSequence, Bytes(length));
+    ASSERT_EQ(algorithm.size(), length + 4);
+    const ProcessedBlock processed(
+        Concat({up_to_algorithm, algorithm, der::OctetString(Bytes(8, 1))}));
+    EXPECT_EQ(processed.result, length == most ? 0 : 1);
+    EXPECT_EQ(processed.output, length == most ? "" : std::string(kUnreadable) + kSignerTrailer);
+  }
+}
+
 TEST(ProcessCertSigner, EncryptedDigestThatWouldStartBeyondTheEndGivesTheUnreadableLine) {
   const ProcessedBlock processed(
       WithSigners(SignerOf({Sha256Algorithm(), FromHex("30 10 06 01"), FromHex("04 01 aa")})));
@@ -176,8 +227,7 @@ TEST(ProcessCertBounds, EveryTruncationIsRefused) {
 
 TEST(ProcessCertBounds, EveryTruncationOfABlockOfIndefiniteLengthsStaysInside) {
   // The SignerInfo ends with its digestAlgorithm, so that it is read as long as that is there.
-  const Bytes whole = BlockEndingIn(Concat({
-      der::Context(0, *WithRsaKey(Bytes(64, 0x77), {3}).certificates),
+  const Bytes whole = BlockEndingInSigners(Concat({
       FromHex("31 80 30 14 02 01 01 30 80"),
       Sha256Algorithm(),
       AlgorithmIdentifier("1.2.840.113549.1.1.1"),

@@ -85,7 +85,7 @@ TEST(ProcessCertHeader, UnreadableContentTypeGivesThePlainLine) {
 TEST(ProcessCertHeader, UnreadableLaterHeadersGiveTheirTagAndTheDistanceToNull) {
   // The elements before, then an octet that starts an element and nothing else: the [0] of the
   // content, the SignedData, its version, digestAlgorithms, contentInfo and certificates.
-  const std::pair<const char*, uint32_t> cases[] = {
+  const std::pair<const char*, int32_t> cases[] = {
       {"30 04 06 01 2a a0", 0},
       {"30 06 06 01 2a a0 01 30", 16},
       {"30 08 06 01 2a a0 03 30 01 02", 2},
@@ -95,6 +95,18 @@ TEST(ProcessCertHeader, UnreadableLaterHeadersGiveTheirTagAndTheDistanceToNull) 
   };
   for (const auto& [digits, tag] : cases) {
     const ProcessedBlock processed(FromHex(digits));
+    EXPECT_EQ(processed.result, 1);
+    EXPECT_EQ(processed.output, processed.UnreadableTag(tag) + kHeaderTrailer) << digits;
+  }
+}
+
+TEST(ProcessCertHeader, TagIsPrintedAsASignedNumber) {
+  // 2^31 - 1, 2^31 and 2^32 - 1, in octets of seven bits.
+  const std::pair<const char*, int32_t> cases[] = {{"bf 87 ff ff ff 7f", 2147483647},
+                                                   {"bf 88 80 80 80 00", INT32_MIN},
+                                                   {"bf 8f ff ff ff 7f", -1}};
+  for (const auto& [digits, tag] : cases) {
+    const ProcessedBlock processed(Concat({FromHex("30 09 06 01 2a"), FromHex(digits)}));
     EXPECT_EQ(processed.result, 1);
     EXPECT_EQ(processed.output, processed.UnreadableTag(tag) + kHeaderTrailer) << digits;
   }
@@ -190,6 +202,38 @@ TEST(ProcessCertKey, UnreadableKeyGivesTheUnreadableLine) {
   }
 }
 
+// What the key lacks stands right behind its BIT STRING, in a tbsCertificate whose other fields are
+// not read.
+TEST(ProcessCertKey, KeyEndsWithItsBitString) {
+  const Bytes key = der::Sequence({der::Integer(Bytes(64, 0x77)), der::Integer(3)});
+  for (size_t length = 0; length <= key.size(); ++length) {
+    const auto cut = key.begin() + static_cast<ptrdiff_t>(length);
+    Certificate certificate;
+    certificate.version = {};
+    certificate.public_key_info = PublicKeyInfoAround(Bytes(key.begin(), cut));
+    certificate.tbs_tail = Bytes(cut, key.end());
+    certificate.signature = der::BitString(Bytes(8, 0x5a));
+    SignatureBlock block;
+    block.certificates = certificate.Build();
+    block.encrypted_digest = der::OctetString(Bytes(8, 0xa5));
+    const ProcessedBlock processed(block);
+    const bool whole = length == key.size();
+    EXPECT_EQ(processed.result, whole ? 0 : 1) << length;
+    EXPECT_EQ(processed.output, whole ? "" : std::string(kUnreadable) + kKeyTrailer) << length;
+  }
+}
+
+TEST(ProcessCertKey, ModulusEndsWithTheSequence) {
+  const Bytes exponent = der::Integer(3);
+  Bytes modulus = der::Integer(Bytes(64, 0x77));
+  EXPECT_EQ(ProcessedBlock(WithPublicKey(Concat({der::Sequence({modulus}), exponent}))).result, 0);
+  ++modulus[1];
+  const ProcessedBlock processed(
+      WithPublicKey(Concat({der::Sequence({modulus}), {0x77}, exponent})));
+  EXPECT_EQ(processed.result, 1);
+  EXPECT_EQ(processed.output, std::string(kUnreadable) + kKeyTrailer);
+}
+
 TEST(ProcessCertKey, ClassesAreNotLookedAt) {
   // A [16] of a [2] and a [2].
   const Bytes modulus(64, 0x77);
@@ -242,6 +286,14 @@ TEST(ProcessCertKey, ExponentIsComparedWithTheLengthOfTheModulus) {
   EXPECT_EQ(processed.record.modulus_length, 4u);
 }
 
+// The zero that the record leaves out counts: five bytes.
+TEST(ProcessCertKey, ExponentIsComparedWithTheLengthOfTheModulusAsWritten) {
+  const ProcessedBlock processed(WithRsaKey(Concat({{0x00}, Bytes(4, 0x77)}), {1, 0, 1}));
+  EXPECT_EQ(processed.result, 0);
+  EXPECT_EQ(processed.record.modulus_length, 4u);
+  EXPECT_EQ(ProcessedBlock(WithRsaKey(Concat({{0x00}, Bytes(3, 0x77)}), {1, 0, 1})).result, 1);
+}
+
 TEST(ProcessCertKey, ExponentMayStandBehindTheKey) {
   const ProcessedBlock processed(
       WithPublicKey(Concat({der::Sequence({der::Integer(Bytes(64, 0x77))}), der::Integer(3)})));
@@ -290,6 +342,14 @@ TEST(ProcessCertKey, ExponentIsCopiedAsItIsWithZerosBehind) {
     EXPECT_EQ(Field(processed.record.exponent, 4), FromHex(expected)) << contents;
     EXPECT_EQ(processed.record.modulus_length, 64u);
   }
+}
+
+TEST(ProcessCertKey, ExponentEndsInZerosWhateverTheRecordHeld) {
+  const Bytes block = WithRsaKey(Bytes(64, 0x77), {3}).Build(kSignatureFile);
+  pkcs7 record;
+  memset(&record, 0x11, sizeof(record));
+  EXPECT_EQ(processCert(block.data(), static_cast<uint32_t>(block.size()), &record), 0);
+  EXPECT_EQ(Field(record.exponent, 4), FromHex("03 00 00 00"));
 }
 
 TEST(ProcessCertKey, LongerExponentRunsOnIntoTheModulusLength) {

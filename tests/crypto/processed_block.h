@@ -40,10 +40,10 @@ struct ProcessedBlock {
 
   // The line of a header that could not be read, of which `tag` was decoded: its offset is the
   // distance from the block to the null address, modulo the size of the address space.
-  std::string UnreadableTag(uint32_t tag) const {
+  std::string UnreadableTag(int32_t tag) const {
     char line[128];
     snprintf(line, sizeof(line),
-             "CERT_PARCER [ERROR]: CANT PROCESS CERTIFICATE TAG = %" PRIu32 ", offset = 0x%" PRIx64
+             "CERT_PARCER [ERROR]: CANT PROCESS CERTIFICATE TAG = %" PRId32 ", offset = 0x%" PRIx64
              "\n",
              tag, ~reinterpret_cast<uint64_t>(bytes.data()) + 1);
     return line;

@@ -95,6 +95,14 @@ TEST(RsaPkcs1Verify, Sha1AndMd5SignaturesNeedNoSha256Digest) {
                                 key.Sign(NID_md5, kMd5).data()));
 }
 
+TEST(RsaPkcs1Verify, Sha1AndSha256SignaturesNeedNoMd5Digest) {
+  const FixedKey key("rsa-1024");
+  for (const auto& [nid, digest] : {std::pair(NID_sha1, kSha1), std::pair(NID_sha256, kSha256)}) {
+    EXPECT_EQ(0, rsa_pkcs1_verify(&key.context, kSha1.data(), kSha256.data(), nullptr,
+                                  key.Sign(nid, digest).data()));
+  }
+}
+
 TEST(RsaPkcs1Verify, Sha1SignatureVerifiesAndAChangedDigestDoesNot) {
   const FixedKey key("rsa-1024");
   const Bytes signature = key.Sign(NID_sha1, kSha1);
@@ -213,6 +221,30 @@ TEST(RsaPkcs1Verify, PaddingWithoutASeparatorIsInvalid) {
     EXPECT_EQ(7, Verify(key.context, key.SignBlock(block)));
   }
   EXPECT_EQ(log.records(), kNoRecords);
+}
+
+// The padding of a shorter block ends where a longer one, which was recovered just before in the
+// same place, had a zero.
+TEST(RsaPkcs1Verify, PaddingThatRunsToTheLastByteIsNotReadBeyondIt) {
+  const FixedKey longer("rsa-2048");
+  const FixedKey shorter("rsa-1024");
+  const Bytes zeros = longer.SignBlock(Concat({{0x00, 0x01}, Bytes(254)}));
+  const Bytes padding = shorter.SignBlock(Concat({{0x00, 0x01}, Bytes(126, 0xFF)}));
+  LogCapture log;
+  for (int round = 0; round < 2; ++round) {
+    log.Clear();
+    const FixedKey& key = round == 0 ? longer : shorter;
+    EXPECT_EQ(7, Verify(key.context, round == 0 ? zeros : padding));
+    EXPECT_EQ(log.records(), round == 0 ? Records({Error("Invalid padding in RSA")}) : kNoRecords);
+  }
+}
+
+TEST(RsaPkcs1Verify, SeparatorThatIsTheLastByteLeavesAnInfoOfNoBytes) {
+  const FixedKey key("rsa-1024");
+  LogCapture log;
+  EXPECT_EQ(7,
+            Verify(key.context, key.SignBlock(Concat({{0x00, 0x01}, Bytes(125, 0xFF), {0x00}}))));
+  EXPECT_EQ(log.records(), Records({Error("Invalid padding in RSA")}));
 }
 
 TEST(RsaPkcs1Verify, InfoOfAnotherLengthIsInvalidPadding) {

@@ -78,6 +78,22 @@ TEST(X509Extensions, TrueOfAnotherByteIsReadAsAnIdentifier) {
   }
 }
 
+// The two bytes, and the OCTET STRING, would read as a header of the private class and its value.
+TEST(X509Extensions, FlagOfTwoBytesOnAnUnderstoodExtensionIsMinus15) {
+  const Bytes rest = FromHex("04 03 02 05 a0");
+  EXPECT_EQ(ResultOf(With({RawExtension(kKeyUsage, Concat({FromHex("01 01 04"), rest}))})), 0);
+  EXPECT_EQ(ResultOf(With({RawExtension(kKeyUsage, Concat({FromHex("01 02 ff 04"), rest}))})), -15);
+}
+
+TEST(X509Extensions, FlagOfAnyByteButZeroIsCriticalOnAnUnknownOid) {
+  const Bytes value = der::OctetString(DigitalSignature());
+  for (const uint8_t flag : {0xdf, 0x1f, 0x04}) {
+    const Bytes rest = Concat({der::Boolean(flag), flag == 4 ? FromHex("04 03 02 05 a0") : value});
+    EXPECT_EQ(ResultOf(With({RawExtension(kKeyUsage, rest)})), 0) << int{flag};
+    EXPECT_EQ(ResultOf(With({RawExtension(kUnknown, rest)})), -15) << int{flag};
+  }
+}
+
 TEST(X509Extensions, HeaderAfterTheFlagStartsAtTheFlagItself) {
   // The flag 04 and the OCTET STRING 04 03 02 05 a0 read as an OCTET STRING of four bytes, which
   // are 03 02 05 a0: a BIT STRING whose first and third bits are set.
@@ -266,6 +282,14 @@ TEST(X509AltName, NulInATextIsMinus15AndKeepsNone) {
     EXPECT_EQ(subject.uri, nullptr);
     EXPECT_EQ(subject.uri_length, 0u);
   }
+}
+
+TEST(X509AltName, EmptyRegisteredIdHasNoArcs) {
+  const ParsedCertificate parsed(With(
+      {Extension(kSubjectAltName, der::Sequence({der::ContextPrimitive(8, der::OidContents("1.2")),
+                                                 der::ContextPrimitive(8, {})}))}));
+  EXPECT_EQ(parsed.result, 0);
+  EXPECT_EQ(parsed.cert.subject.rid.len, 0u);
 }
 
 TEST(X509AltName, MalformedIsMinus15) {

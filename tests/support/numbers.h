@@ -72,6 +72,23 @@ class Operands {
   std::mt19937 random_;
 };
 
+// Which arguments of an operation X op= A, B are the same number.
+enum Alias { kNone, kXIsA, kXIsB, kAIsB, kAllOne, kAliases };
+
+struct Aliased {
+  Number x, a, b;
+  mpi *X, *A, *B;
+
+  Aliased(int alias, Operands* operands, const Limbs& first, const Limbs& second) {
+    Set(&x, operands->Magnitude(6), operands->Sign());
+    Set(&a, first, operands->Sign());
+    Set(&b, second, operands->Sign());
+    A = &a;
+    B = alias == kAIsB || alias == kAllOne ? A : &b;
+    X = alias == kXIsA || alias == kAllOne ? A : alias == kXIsB ? B : &x;
+  }
+};
+
 // Calls `operation`, which returns a result code, with each of its allocations failing in turn.
 template <typename Operation>
 void ExpectNoMemoryAtEveryAllocation(const Operation& operation) {

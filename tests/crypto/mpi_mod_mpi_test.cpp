@@ -1,0 +1,112 @@
+// The long division against GMP.
+#include <gtest/gtest.h>
+
+#include <ctime>
+
+#include "crypto/mpi.h"
+#include "support/numbers.h"
+
+namespace {
+
+constexpr int kRounds = 150000;
+
+// Dividends that are arbitrary, or just beside a multiple of the divisor, where estimates fail.
+TEST(MpiModMpi, IsTheNonNegativeRemainder) {
+  Operands operands;
+  for (int round = 0; round < kRounds; ++round) {
+    const Limbs divisor = operands.Magnitude(8);
+    Limbs dividend = operands.Magnitude(16);
+    const mpz_class b = Magnitude(divisor.size(), divisor.data());
+    if (b == 0) continue;
+    if (round % 2 == 0) {
+      const mpz_class near = b * Magnitude(dividend.size(), dividend.data()) - operands.Below(3);
+      if (near >= 0) dividend = LimbsOf(near + operands.Below(2) * (b - 1));
+    }
+    Aliased o(round % kAliases, &operands, dividend, divisor);
+    if (Value(*o.B) == 0) continue;
+    if (o.A != o.B) o.B->s = 1;
+    const mpz_class a = Value(*o.A);
+    const mpz_class modulus = abs(Value(*o.B));
+    mpz_class expected;
+    mpz_mod(expected.get_mpz_t(), a.get_mpz_t(), modulus.get_mpz_t());
+    ASSERT_EQ(0, mpi_mod_mpi(o.X, o.A, o.B));
+    ASSERT_EQ(expected, Value(*o.X)) << a << " mod " << modulus;
+    ASSERT_EQ(1, o.X->s);
+  }
+}
+
+TEST(MpiModMpi, OfAZeroDivisorReturnsEighteen) {
+  Number A({1});
+  Number R({9});
+  Number empty;
+  Number zero({0, 0});
+  EXPECT_EQ(18, mpi_mod_mpi(&R, &A, &empty));
+  EXPECT_EQ(18, mpi_mod_mpi(&R, &A, &zero));
+  EXPECT_EQ(9, Value(R));
+}
+
+TEST(MpiModMpi, OfANegativeNumberIsNotNegativeAndBelowTheDivisor) {
+  Number B({7});
+  Number R;
+  for (uint32_t a = 0; a < 50; ++a) {
+    Number A({a}, -1);
+    EXPECT_EQ(0, mpi_mod_mpi(&R, &A, &B));
+    EXPECT_EQ((7 - a % 7) % 7, Value(R).get_ui());
+  }
+}
+
+TEST(MpiModMpi, DoesNotLookAtTheDivisorsSign) {
+  Number A({0, 5}, -1);
+  Number B({7}, -1);
+  Number R;
+  EXPECT_EQ(0, mpi_mod_mpi(&R, &A, &B));
+  EXPECT_EQ(1, Value(R));  // 2^32 = 4 mod 7, 5 * 4 = 6 mod 7
+}
+
+// A shift that left the divisor's highest bit clear would make the digit's estimate wrap here.
+TEST(MpiModMpi, EndsAtOnceForADivisorOfThirtyOneBitsAtTheTop) {
+  Number A({0x8712b8bc, 0xffffffff, 0x4000fffe});
+  Number B({0x00000001, 0x4000ffff});
+  Number R;
+  EXPECT_EQ(0, mpi_mod_mpi(&R, &A, &B));
+  EXPECT_EQ(mpz_class(Value(A) % Value(B)), Value(R));
+}
+
+TEST(MpiModMpi, EndsAtOnceForEveryTopLimb) {
+  Number R;
+  for (int bit = 0; bit < 32; ++bit) {
+    for (uint32_t low : {0u, 1u, 0xffffu, 0xffff0000u, 0xffffffffu}) {
+      const uint32_t top = (1u << bit) | (0xffffu >> (31 - bit) / 2);
+      Number B({low, top, 0});
+      Number A({0x8712b8bc, 0xffffffff, top - 1, 0});
+      EXPECT_EQ(0, mpi_mod_mpi(&R, &A, &B));
+      EXPECT_EQ(mpz_class(Value(A) % Value(B)), Value(R));
+    }
+  }
+}
+
+TEST(MpiModMpi, OfTwoToThe8192ForAModulusOf128Limbs) {
+  Operands operands;
+  Limbs limbs(128);
+  for (uint32_t& limb : limbs) limb = operands.Limb() | 1;
+  Number N(limbs);
+  Number RR({1});
+  EXPECT_EQ(0, mpi_shift_l(&RR, 8192));
+  EXPECT_EQ(0, mpi_mod_mpi(&RR, &RR, &N));
+  EXPECT_EQ(mpz_class(PowerOfTwo(8192) % Value(N)), Value(RR));
+}
+
+// d is 8000ffff. The half digit of 48000000 0000 is estimated as 9000 and leaves no rest, of which
+// 9000 * ffff are to be taken: d is added, which does not wrap but gives just d, and added again. Who
+// stopped at the first would go on with a digit far too large, and count it down by ones.
+TEST(MpiModMpi, EndsAtOnceWhereTheRestComesToTheDivisor) {
+  const Number A({0x12345678, 0x0000abcd, 0x48000000});
+  const Number B({0xfedcba98, 0x8000ffff});
+  Number R;
+  const clock_t start = clock();
+  for (int round = 0; round < 20000; ++round) ASSERT_EQ(0, mpi_mod_mpi(&R, &A, &B));
+  EXPECT_LT(clock() - start, 5 * CLOCKS_PER_SEC);
+  EXPECT_EQ(mpz_class(Value(A) % Value(B)), Value(R));
+}
+
+}  // namespace

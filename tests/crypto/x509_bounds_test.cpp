@@ -1,0 +1,239 @@
+// Elements that run on beyond what holds them, into bytes that would do: each certificate here would
+// be read to its end if the element were allowed those bytes. And what may follow the last element
+// that is read.
+#include <gtest/gtest.h>
+
+#include "crypto/parsed_certificate.h"
+
+namespace {
+
+constexpr char kCommonName[] = "2.5.4.3";
+constexpr char kKeyUsage[] = "2.5.29.15";
+constexpr char kSubjectAltName[] = "2.5.29.17";
+constexpr char kBasicConstraints[] = "2.5.29.19";
+constexpr char kUnknown[] = "1.2.3.4";
+
+// The element with a length of `more` bytes more than it has; both lengths have one octet.
+Bytes RunningOn(Bytes element, size_t more = 1) {
+  EXPECT_LT(element[1] + more, 0x80u);
+  element[1] = static_cast<uint8_t>(element[1] + more);
+  return element;
+}
+
+Bytes Value() { return der::Element(der::kUtf8String, "Test"); }
+Bytes DigitalSignature() { return der::BitString({0x80}, 7); }
+
+Certificate WithSubject(const Bytes& subject) {
+  Certificate certificate = Unsigned();
+  certificate.subject = subject;
+  return certificate;
+}
+
+int ResultOfExtensions(const std::vector<Bytes>& extensions) {
+  Certificate certificate = Unsigned();
+  certificate.extensions = extensions;
+  return ResultOf(certificate);
+}
+
+}  // namespace
+
+TEST(X509RunningOn, CertificatesSignatureIsMinus4) {
+  Certificate certificate = Unsigned();
+  const Bytes good = der::BitString(Bytes(8, 0x5a));
+  for (const auto& [signature, result] : {std::pair(good, 0), std::pair(RunningOn(good), -4)}) {
+    certificate.signature = signature;
+    EXPECT_EQ(ResultOf(Concat({certificate.Build(), {0x5a}})), result);
+  }
+}
+
+TEST(X509RunningOn, AlgorithmsIdentifierIsMinus11OrMinus14) {
+  const Bytes good = der::Sequence({der::Oid("1.2.3")});
+  const Bytes bad = der::Sequence({RunningOn(der::Oid("1.2.3"))});
+  const Bytes key = der::BitString({1});
+  for (const auto& [algorithm, is_good] : {std::pair(good, true), std::pair(bad, false)}) {
+    Certificate certificate = Unsigned();
+    certificate.tbs_algorithm = algorithm;
+    EXPECT_EQ(ResultOf(certificate), is_good ? 0 : -11);
+    certificate = Unsigned();
+    certificate.signature_algorithm = algorithm;
+    EXPECT_EQ(ResultOf(certificate), is_good ? 0 : -11);
+    certificate = Unsigned();
+    certificate.public_key_info = der::Sequence({algorithm, key});
+    EXPECT_EQ(ResultOf(certificate), is_good ? 0 : -14);
+  }
+}
+
+TEST(X509RunningOn, AlgorithmsParametersAreLeftEmpty) {
+  Certificate certificate = Unsigned();
+  const Bytes algorithm = der::Sequence({der::Oid("1.2.3"), RunningOn(der::Oid("1.2.3"))});
+  certificate.tbs_algorithm = algorithm;
+  certificate.signature_algorithm = algorithm;
+  certificate.public_key_info = der::Sequence({algorithm, der::BitString({1})});
+  const ParsedCertificate parsed(certificate);
+  EXPECT_EQ(parsed.result, 0);
+  EXPECT_EQ(parsed.cert.signature_params_oid.len, 0u);
+  EXPECT_EQ(parsed.cert.public_key_params_oid.len, 0u);
+  EXPECT_EQ(parsed.cert.signature_algorithm_params_oid.len, 0u);
+}
+
+TEST(X509RunningOn, ElementsOfANameAreMinus12) {
+  const Bytes type = der::Oid(kCommonName);
+  const Bytes attribute = der::Sequence({type, Value()});
+  EXPECT_EQ(ResultOf(WithSubject(der::Sequence({der::Set({attribute})}))), 0);
+  const Bytes cases[] = {
+      der::Sequence({RunningOn(der::Set({attribute}))}),                        // the SET
+      der::Sequence({der::Set({RunningOn(attribute)})}),                        // what it holds
+      der::Sequence({der::Set({der::Sequence({type, RunningOn(Value())})})}),   // a value
+      der::Sequence({der::Set({der::Sequence({RunningOn(type, 7)}), Value()})}  // a type
+                    )};
+  for (const Bytes& name : cases) {
+    Certificate certificate = WithSubject(name);
+    EXPECT_EQ(ResultOf(certificate), -12);
+    certificate = Unsigned();
+    certificate.issuer = name;
+    EXPECT_EQ(ResultOf(certificate), -12);
+  }
+}
+
+// The time is short of two bytes, and the subject, of 90 bytes, begins 30 5a: the text "0Z".
+TEST(X509RunningOn, TimeIsMinus13) {
+  Certificate certificate = WithSubject(Name({{kCommonName, std::string(79, 'x')}}));
+  ASSERT_EQ(certificate.subject[0], '0');
+  ASSERT_EQ(certificate.subject[1], 'Z');
+  const Bytes not_before = der::Element(der::kUtcTime, "200102030405Z");
+  certificate.validity = der::Sequence({not_before, der::Element(der::kUtcTime, "4901020304050")});
+  EXPECT_EQ(ResultOf(certificate), -13);
+  const Bytes not_after = der::Element(der::kUtcTime, "49010203040");
+  certificate.validity = der::Sequence({not_before, RunningOn(not_after, 2)});
+  EXPECT_EQ(ResultOf(certificate), -13);
+}
+
+TEST(X509RunningOn, KeyIsMinus14) {
+  const Bytes algorithm = AlgorithmIdentifier("1.2.3");
+  const Bytes key = der::BitString({1, 2, 3});
+  Certificate certificate = Unsigned();
+  certificate.public_key_info = der::Sequence({algorithm, key});
+  EXPECT_EQ(ResultOf(certificate), 0);
+  certificate.public_key_info = der::Sequence({algorithm, RunningOn(key)});
+  EXPECT_EQ(ResultOf(certificate), -14);
+  certificate.public_key_info = der::Sequence({RunningOn(algorithm, key.size()), key});
+  EXPECT_EQ(ResultOf(certificate), -14);
+}
+
+// What follows the [3] is an Extension, too.
+TEST(X509RunningOn, SequenceOfExtensionsIsMinus15) {
+  const Bytes extension = Extension(kUnknown, der::Null());
+  const Bytes extensions = der::Sequence({extension});
+  Certificate certificate = Unsigned();
+  certificate.tbs_tail = Concat({der::Context(3, extensions), extension});
+  EXPECT_EQ(ResultOf(certificate), 0);
+  certificate.tbs_tail =
+      Concat({der::Context(3, RunningOn(extensions, extension.size())), extension});
+  EXPECT_EQ(ResultOf(certificate), -15);
+}
+
+TEST(X509RunningOn, ExtensionIsMinus15) {
+  const Bytes extension = Extension(kUnknown, der::Null());
+  EXPECT_EQ(ResultOfExtensions({extension, extension}), 0);
+  EXPECT_EQ(ResultOfExtensions({extension, RunningOn(extension)}), -15);
+}
+
+TEST(X509RunningOn, ElementsOfAnExtensionAreMinus15) {
+  const Bytes value = der::OctetString(DigitalSignature());
+  EXPECT_EQ(ResultOfExtensions({der::Sequence({der::Oid(kKeyUsage), value})}), 0);
+  EXPECT_EQ(ResultOfExtensions({der::Sequence({der::Oid(kKeyUsage), RunningOn(value)})}), -15);
+  // After a flag of 04 the OCTET STRING is 04 04 03 02 05 a0.
+  const Bytes id = Concat({der::Oid(kKeyUsage), der::Boolean(4)});
+  const Bytes whole = FromHex("04 03 02 05 a0");
+  const Bytes cut = FromHex("04 03 02 05");
+  EXPECT_EQ(ResultOfExtensions({der::Sequence({id, whole}), Extension(kUnknown, {})}), 0);
+  EXPECT_EQ(ResultOfExtensions({der::Sequence({id, cut}), Extension(kUnknown, {})}), -15);
+}
+
+TEST(X509RunningOn, ValueInItsOctetStringIsMinus15) {
+  const Bytes key_usage = RunningOn(DigitalSignature());
+  const Bytes constraints = der::Sequence({der::Boolean(0xff), der::Integer(3)});
+  const Bytes names = der::Sequence({der::ContextPrimitive(2, ToBytes("a"))});
+  const Bytes another = der::ContextPrimitive(2, ToBytes("b"));
+  EXPECT_EQ(ResultOfExtensions({Extension(kKeyUsage, key_usage), Extension(kUnknown, {})}), -15);
+  EXPECT_EQ(ResultOfExtensions({Extension(kBasicConstraints, constraints)}), 0);
+  EXPECT_EQ(ResultOfExtensions({Extension(kBasicConstraints, RunningOn(constraints))}), -15);
+  const auto with_another = [&](const Bytes& value) {
+    return der::Sequence({der::Oid(kSubjectAltName), der::OctetString(value), another});
+  };
+  EXPECT_EQ(ResultOfExtensions({with_another(names)}), 0);
+  EXPECT_EQ(ResultOfExtensions({with_another(RunningOn(names, another.size()))}), -15);
+}
+
+TEST(X509RunningOn, ElementsOfAValueAreMinus15) {
+  const Bytes ca = der::Boolean(0xff);
+  const Bytes length = der::Integer(3);
+  const auto result_of = [](const std::string& oid, const Bytes& sequence) {
+    // The byte that the element would take is the value's, behind the SEQUENCE.
+    return ResultOfExtensions({Extension(oid, Concat({sequence, {0}}))});
+  };
+  EXPECT_EQ(result_of(kBasicConstraints, der::Sequence({ca, length})), 0);
+  EXPECT_EQ(result_of(kBasicConstraints, der::Sequence({ca, RunningOn(length)})), -15);
+  EXPECT_EQ(result_of(kBasicConstraints, der::Sequence({RunningOn(length)})), -15);
+  EXPECT_EQ(result_of(kBasicConstraints, der::Sequence({FromHex("01 01")})), -15);
+  const Bytes address = der::ContextPrimitive(7, {10, 0, 0, 1});
+  EXPECT_EQ(result_of(kSubjectAltName, der::Sequence({address})), 0);
+  EXPECT_EQ(result_of(kSubjectAltName, der::Sequence({RunningOn(address)})), -15);
+}
+
+TEST(X509Trailing, LoneByteInANameIsMinus12) {
+  const Bytes rdn = der::Set({der::Sequence({der::Oid(kCommonName), Value()})});
+  for (const uint8_t byte : {0x00, 0x31}) {
+    EXPECT_EQ(ResultOf(WithSubject(der::Sequence({rdn, {byte}}))), -12);
+    EXPECT_EQ(ResultOf(WithSubject(der::Sequence({{byte}}))), -12);
+  }
+}
+
+TEST(X509Trailing, LoneByteInTheExtensionsIsMinus15) {
+  for (const uint8_t byte : {0x00, 0x30}) {
+    EXPECT_EQ(ResultOfExtensions({Extension(kUnknown, der::Null()), {byte}}), -15);
+    EXPECT_EQ(ResultOfExtensions({{byte}}), -15);
+  }
+}
+
+TEST(X509Trailing, LoneByteInTheAlternativeNamesIsMinus15) {
+  for (const uint8_t byte : {0x00, 0x82}) {
+    EXPECT_EQ(ResultOfExtensions({Extension(kSubjectAltName, der::Sequence({{byte}}))}), -15);
+  }
+}
+
+TEST(X509Trailing, LoneByteAfterTheKeyIsMinus5) {
+  Certificate certificate = Unsigned();
+  certificate.tbs_tail = {0xa4};
+  EXPECT_EQ(ResultOf(certificate), -5);
+  // But a v1 certificate has no fields there that would be read.
+  certificate.version = {};
+  EXPECT_EQ(ResultOf(certificate), 0);
+}
+
+// Half of a header, where the rest of each element is not looked at.
+TEST(X509Trailing, WhatFollowsTheLastElementThatIsReadIsIgnored) {
+  const Bytes rest = {0x30};
+  const Bytes time = der::Element(der::kUtcTime, "200102030405Z");
+  const Bytes algorithm = der::Sequence({der::Oid("1.2.3"), der::Oid("1.2.4"), rest});
+  Certificate certificate = Unsigned();
+  certificate.tbs_algorithm = algorithm;
+  certificate.validity = der::Sequence({time, time, rest});
+  certificate.subject =
+      der::Sequence({der::Set({der::Sequence({der::Oid(kCommonName), Value(), rest}), rest})});
+  certificate.public_key_info = der::Sequence({algorithm, der::BitString({1}), rest});
+  certificate.tbs_tail = Concat(
+      {der::Context(
+           3, Concat({der::Sequence({der::Sequence(
+                          {der::Oid(kKeyUsage),
+                           der::OctetString(Concat({DigitalSignature(), rest})), rest})}),
+                      rest})),
+       rest});
+  certificate.signature_algorithm = algorithm;
+  certificate.signature = Concat({der::BitString({1}), rest});
+  const ParsedCertificate parsed(certificate);
+  EXPECT_EQ(parsed.result, 0);
+  EXPECT_EQ(parsed.cert.signature_value_length, 1u);
+  EXPECT_EQ(parsed.cert.subject.attribute_count, 1u);
+  EXPECT_EQ(parsed.cert.key_usage, 1u);
+}
