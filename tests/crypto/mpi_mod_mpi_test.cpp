@@ -97,8 +97,8 @@ TEST(MpiModMpi, OfTwoToThe8192ForAModulusOf128Limbs) {
 }
 
 // d is 8000ffff. The half digit of 48000000 0000 is estimated as 9000 and leaves no rest, of which
-// 9000 * ffff are to be taken: d is added, which does not wrap but gives just d, and added again. Who
-// stopped at the first would go on with a digit far too large, and count it down by ones.
+// 9000 * ffff are to be taken: d is added, which does not wrap but gives just d, and added again.
+// Who stopped at the first would go on with a digit far too large, and count it down by ones.
 TEST(MpiModMpi, EndsAtOnceWhereTheRestComesToTheDivisor) {
   const Number A({0x12345678, 0x0000abcd, 0x48000000});
   const Number B({0xfedcba98, 0x8000ffff});

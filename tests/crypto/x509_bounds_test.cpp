@@ -1,6 +1,6 @@
-// Elements that run on beyond what holds them, into bytes that would do: each certificate here would
-// be read to its end if the element were allowed those bytes. And what may follow the last element
-// that is read.
+// Elements that run on beyond what holds them, into bytes that would do: each certificate here
+// would be read to its end if the element were allowed those bytes. And what may follow the last
+// element that is read.
 #include <gtest/gtest.h>
 
 #include "crypto/parsed_certificate.h"
@@ -223,11 +223,10 @@ TEST(X509Trailing, WhatFollowsTheLastElementThatIsReadIsIgnored) {
       der::Sequence({der::Set({der::Sequence({der::Oid(kCommonName), Value(), rest}), rest})});
   certificate.public_key_info = der::Sequence({algorithm, der::BitString({1}), rest});
   certificate.tbs_tail = Concat(
-      {der::Context(
-           3, Concat({der::Sequence({der::Sequence(
-                          {der::Oid(kKeyUsage),
-                           der::OctetString(Concat({DigitalSignature(), rest})), rest})}),
-                      rest})),
+      {der::Context(3, Concat({der::Sequence({der::Sequence(
+                                   {der::Oid(kKeyUsage),
+                                    der::OctetString(Concat({DigitalSignature(), rest})), rest})}),
+                               rest})),
        rest});
   certificate.signature_algorithm = algorithm;
   certificate.signature = Concat({der::BitString({1}), rest});
