@@ -12,6 +12,9 @@ struct montgomery {
   const mpi* N;
   uint32_t mm;
   mpi_local T;
+
+  // X = A, with room for a product in its place.
+  int copy(mpi* X, const mpi* A) const;
   void multiply(mpi* A, const mpi* B) { mpi_montmul(A, B, N, mm, &T); }
 };
 
@@ -30,21 +33,20 @@ int mpi_pow_mod(mpi* X, const mpi* A, const mpi* E, const mpi* N) {
   mpi_local W[kWindowTableSize];
   mpi_local RR;
   mpi_local one;
-  if (const int result = mpi_grow(X, N->n + 1)) return result;
-  if (const int result = mpi_grow(&W[1], N->n + 1)) return result;
   if (const int result = mpi_grow(&m.T, 2 * (N->n + 1))) return result;
   if (const int result = mpi_grow(&one, 1)) return result;
-  if (const int result = mpi_grow(&RR, 1)) return result;
   one.p[0] = 1;
-  RR.p[0] = 1;
   // A product with R^2 mod N, R = 2^(32 * N.n), takes a number into Montgomery form, one with 1
   // takes it out again.
+  if (const int result = mpi_assign(&RR, &one)) return result;
   if (const int result = mpi_shift_l(&RR, 2 * kMpiLimbBits * N->n)) return result;
   if (const int result = mpi_mod_mpi(&RR, &RR, N)) return result;
-  const bool reduced = mpi_compare(A, N) < 0;
-  if (const int result = reduced ? mpi_assign(&W[1], A) : mpi_mod_mpi(&W[1], A, N)) return result;
+  if (const int result = m.copy(&W[1], A)) return result;
+  if (mpi_compare(A, N) >= 0) {
+    if (const int result = mpi_mod_mpi(&W[1], A, N)) return result;
+  }
   m.multiply(&W[1], &RR);
-  if (const int result = mpi_assign(X, &RR)) return result;
+  if (const int result = m.copy(X, &RR)) return result;
   m.multiply(X, &one);
   if (const int result = fill_window(W, w, &m)) return result;
   raise(X, E, W, w, &m);
@@ -53,6 +55,11 @@ int mpi_pow_mod(mpi* X, const mpi* A, const mpi* E, const mpi* N) {
 }
 
 namespace {
+
+int montgomery::copy(mpi* X, const mpi* A) const {
+  const int result = mpi_grow(X, N->n + 1);
+  return result != 0 ? result : mpi_assign(X, A);
+}
 
 // -1 / m0 mod 2^32 for an odd m0: its inverse modulo 2^4, then Newton steps that double the bits.
 WRAPS_ON_PURPOSE uint32_t montgomery_constant(uint32_t m0) {
@@ -68,16 +75,13 @@ int window_size(int bits) {
 }
 
 // From W[1] makes the powers W[i] = W[1]^i whose index has w bits, highest bit set: a window begins
-// with a set bit, so no other is ever needed.
+// with a set bit, so no other is ever needed. For a w of 1 there are no more than W[1].
 int fill_window(mpi_local* W, int w, montgomery* m) {
-  if (w == 1) return 0;
   const int j = 1 << (w - 1);
-  if (const int result = mpi_grow(&W[j], m->N->n + 1)) return result;
-  if (const int result = mpi_assign(&W[j], &W[1])) return result;
+  if (const int result = m->copy(&W[j], &W[1])) return result;
   for (int i = 1; i < w; ++i) m->multiply(&W[j], &W[j]);
   for (int i = j + 1; i < 2 * j; ++i) {
-    if (const int result = mpi_grow(&W[i], m->N->n + 1)) return result;
-    if (const int result = mpi_assign(&W[i], &W[i - 1])) return result;
+    if (const int result = m->copy(&W[i], &W[i - 1])) return result;
     m->multiply(&W[i], &W[1]);
   }
   return 0;

@@ -50,6 +50,7 @@ void ExpectPower(const mpz_class& a, const mpz_class& e, const Limbs& modulus) {
   mpz_powm(expected.get_mpz_t(), a.get_mpz_t(), e.get_mpz_t(), Value(N).get_mpz_t());
   Number X;
   ASSERT_EQ(0, mpi_pow_mod(&X, &A, &E, &N));
+  ASSERT_EQ(N.n + 1, X.n);
   ASSERT_EQ(expected, Value(X)) << modulus.size() << " limbs, exponent " << e;
 }
 

@@ -270,11 +270,16 @@ TEST(ProcessCertKey, ModulusLosesExactlyOneZero) {
   EXPECT_EQ(Field(processed.record.modulus, processed.record.modulus_length), rest);
 }
 
+// A modulus of no bytes, which a zero follows, one of a zero, and one of two.
 TEST(ProcessCertKey, EmptyModulusLeavesNoRoomForTheExponent) {
-  const ProcessedBlock processed(WithRsaKey({}, {3}));
-  EXPECT_EQ(processed.result, 1);
-  EXPECT_EQ(processed.output, std::string(kUnreadable) + kKeyTrailer);
-  EXPECT_EQ(processed.record.modulus_length, 0u);
+  for (const auto& [digits, length] :
+       {std::pair("30 03 02 00 00", 0u), std::pair("30 06 02 01 00 02 01 03", 0u),
+        std::pair("30 07 02 02 00 00 02 01 03", 1u)}) {
+    const ProcessedBlock processed(WithPublicKey(FromHex(digits)));
+    EXPECT_EQ(processed.result, 1);
+    EXPECT_EQ(processed.output, std::string(kUnreadable) + kKeyTrailer);
+    EXPECT_EQ(processed.record.modulus_length, length) << digits;
+  }
 }
 
 TEST(ProcessCertKey, ExponentIsComparedWithTheLengthOfTheModulus) {

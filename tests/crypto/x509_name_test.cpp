@@ -253,6 +253,13 @@ TEST(X509Time, OtherLengthsAreMinus13) {
   }
 }
 
+TEST(X509Time, AnotherTypeIsMinus13) {
+  for (const uint8_t identifier : {der::kUtf8String, der::kPrintableString, der::kOctetString}) {
+    NotBefore(identifier, "200102030405Z", -13);
+    NotBefore(identifier, "20200102030405Z", -13);
+  }
+}
+
 TEST(X509Time, TimeThatDoesNotEndInZIsMinus13) {
   NotBefore(der::kUtcTime, "200102030405z", -13);
   NotBefore(der::kUtcTime, "2001020304050", -13);

@@ -1,0 +1,220 @@
+"""Runs functions of the tool's sources, as they stand there, on values of Python's.
+
+A function's statements are translated into Python's, which for the arithmetic that is proved here
+read almost alike. A value may be a Word: a term of z3's that stands for every value of its type; a
+comparison of such a value splits the run into one for each answer that is possible.
+"""
+import pathlib
+import re
+
+import z3
+
+ROOT = pathlib.Path(__file__).resolve().parents[2]
+
+
+class Word:
+    """An unsigned number, with the operators of C++. What a product and a quotient are, a proof has
+    to say."""
+
+    product = quotient = None
+
+    def __init__(self, term):
+        self.term = term
+
+    def of_same_type(self, other):
+        if isinstance(other, Word):
+            return other
+        return Word(z3.BitVecVal(int(other), self.term.size()))
+
+    def apply(self, operation, other):
+        return Word(operation(self.term, self.of_same_type(other).term))
+
+    def __add__(self, other):
+        return self.apply(lambda a, b: a + b, other)
+
+    def __sub__(self, other):
+        return self.apply(lambda a, b: a - b, other)
+
+    def __and__(self, other):
+        return self.apply(lambda a, b: a & b, other)
+
+    def __or__(self, other):
+        return self.apply(lambda a, b: a | b, other)
+
+    def __lshift__(self, other):
+        return self.apply(lambda a, b: a << b, other)
+
+    def __rshift__(self, other):
+        return self.apply(z3.LShR, other)
+
+    def __mul__(self, other):
+        return Word.product(self, self.of_same_type(other))
+
+    def __floordiv__(self, other):
+        return Word.quotient(self, self.of_same_type(other))
+
+    def __lt__(self, other):
+        return self.compare(z3.ULT, other)
+
+    def __eq__(self, other):
+        return self.compare(lambda a, b: a == b, other)
+
+    __radd__ = __add__
+    __rmul__ = __mul__
+
+    def compare(self, relation, other):
+        condition = relation(self.term, self.of_same_type(other).term)
+        one, zero = z3.BitVecVal(1, self.term.size()), z3.BitVecVal(0, self.term.size())
+        return Answer(z3.If(condition, one, zero), condition)
+
+
+class Answer(Word):
+    """What a comparison gives: a number, 0 or 1, and, where the run depends on it, a decision."""
+
+    runs = None
+
+    def __init__(self, term, condition):
+        super().__init__(term)
+        self.condition = condition
+
+    def __bool__(self):
+        return Answer.runs.decide(self.condition)
+
+
+class Runs:
+    """All the runs of `function` that are possible where `assumptions` hold. Iterating gives, for
+    each, what holds on it and what it returns."""
+
+    def __init__(self, function, assumptions, most=20):
+        self.function, self.assumptions, self.most = function, assumptions, most
+
+    def __iter__(self):
+        unexplored = [[]]
+        while unexplored:
+            self.planned = unexplored.pop()
+            self.taken = []
+            Answer.runs = self
+            result = self.function()
+            yield self.assumptions + [c if yes else z3.Not(c) for c, yes in self.taken], result
+            for i in range(len(self.planned), len(self.taken)):
+                other = [yes for _, yes in self.taken[:i]] + [not self.taken[i][1]]
+                if self.possible(self.taken[:i] + [(self.taken[i][0], other[-1])]):
+                    unexplored.append(other)
+
+    def decide(self, condition):
+        if len(self.taken) == self.most:
+            raise AssertionError("the run does not end")
+        if len(self.taken) < len(self.planned):
+            yes = self.planned[len(self.taken)]
+        else:
+            yes = self.possible(self.taken + [(condition, True)])
+        self.taken.append((condition, yes))
+        return yes
+
+    def possible(self, decisions):
+        solver = z3.Solver()
+        solver.add(*self.assumptions)
+        solver.add(*(c if yes else z3.Not(c) for c, yes in decisions))
+        return solver.check() != z3.unsat
+
+
+class Pointer:
+    """Points at values: one, or a few."""
+
+    def __init__(self, *values):
+        self.values = list(values)
+
+    def __add__(self, offset):
+        return Pointer(*self.values[offset:])
+
+    def __getitem__(self, index):
+        return self.values[index]
+
+    def __setitem__(self, index, value):
+        self.values[index] = value
+
+
+def load(path, name, **constants):
+    """The function `name` of the source file, as one of Python's, whose globals are the constants
+    of the file that are numbers, and `constants`."""
+    text = re.sub(r"//[^\n]*|^#[^\n]*", "", (ROOT / path).read_text(), flags=re.M)
+    scope = {"Pointer": Pointer, **constants}
+    for constant, value in re.findall(r"constexpr \w+ (k\w+) = ([^;{}]+);\n", text):
+        try:
+            scope[constant] = eval(expression(value), scope)
+        except (NameError, SyntaxError):
+            pass  # not made of numbers alone
+    found = re.search(r"^(?!\s)[^\n;{}]*?\b%s\(([^;{}]*)\) \{\n(.*?)^\}" % name, text, re.S | re.M)
+    if not found:
+        raise AssertionError(f"{path} has no function {name}")
+    parameters = [re.search(r"(\w+)$", word.strip())[1] for word in found[1].split(",")]
+    lines = [f"def function({', '.join(parameters)}):"] + statements(found[2])
+    exec("\n".join(lines), scope)
+    return scope["function"]
+
+
+TYPE = r"(?:const )?(?:uint\d+_t|int|bool|lanes)\b ?\*?"
+
+
+def statements(body):
+    """The lines of a function's body in Python, each of which is indented by one space a block."""
+    body = re.sub(r"\bif \((.*)\) (\w[^{;]*;)", r"if (\1) {\2}", body)
+    body = re.sub(r"\b(for \(.*?;.*?;.*?\)) ([\w*][^{;]*;)", r"\1 {\2}", body)
+    steps, lines = [], []
+    token = re.compile(r"\s*(for \(.*?;.*?;.*?\) \{|if \(.*?\) \{|\}|[^;{}]+;)", re.S)
+    position, end = 0, len(body.rstrip())
+    while position < end:
+        match = token.match(body, position)
+        if not match:
+            raise AssertionError(f"cannot read: {body[position:position + 60]!r}")
+        position = match.end()
+        text = " ".join(match[1].split())
+        depth = " " * (len(steps) + 1)
+        if text.startswith("for ("):
+            start, condition, step = text[len("for ("):-len(") {")].split("; ")
+            lines += [depth + simple(start), f"{depth}while {expression(condition)}:"]
+            steps.append(simple(step))
+        elif text.startswith("if ("):
+            lines.append(f"{depth}if {expression(text[len('if ('):-len(') {')])}:")
+            steps.append(None)
+        elif text == "}":
+            step = steps.pop()
+            if step:
+                lines.append(depth + step)
+        elif text == "continue;":
+            lines += [depth + next(s for s in reversed(steps) if s), depth + "continue"]
+        else:
+            lines.append(depth + simple(text[:-1]))
+    return lines
+
+
+def simple(text):
+    """A statement without a block."""
+    text = re.sub(r"^constexpr ", "const ", text)
+    copied = re.match(r"memcpy\((&?)(\w+), (.*), sizeof\(\w+\)\)$", text)
+    if copied:
+        source = copied[3].removeprefix("&")
+        is_one = copied[1] and not copied[3].startswith("&")
+        return (f"{copied[2]} = ({source})[0]" if is_one else f"{copied[2]} = Pointer({source})")
+    if re.match(r"typedef |%s[\w\[\], ]+$" % TYPE, text):
+        return "pass"
+    text = re.sub("^" + TYPE + r"(?=\w+ =)", "", text)
+    if text.startswith("return "):
+        return "return " + expression(text[len("return "):])
+    counted = re.match(r"(\+\+|--)(\w+)$", text)
+    if counted:
+        return f"{counted[2]} {counted[1][0]}= 1"
+    target, assigned, value = re.match(r"(.*?)( [-+|<>]*= |$)(.*)", text).groups()
+    return expression(target) + assigned + expression(value)
+
+
+def expression(text):
+    text = re.sub(r"static_cast<[^<>]*>", "", text)
+    text = re.sub(r"(?<![\w)\]] )(?<![\w)\]])\*(\w+)", r"\1[0]", text)  # what a pointer points at
+    text = re.sub(r"&(\w+)(?=[,)\[])", r"\1", text)  # an address that a call is given
+    for cpp, python in (("->", "."), ("std::", ""), ("&&", " and "), ("||", " or "), (" / ", " // "),
+                        ("false", "False"), ("true", "True")):
+        text = text.replace(cpp, python)
+    text = re.sub(r"!(?!=)", " not ", text)
+    text = re.sub(r"\b(0[xX][0-9A-Fa-f]+|\d+)[uUlL]+\b", r"\1", text)
+    return re.sub(r"'(\\?.)'", lambda match: f"ord('{match[1]}')", text).strip()

@@ -1,0 +1,170 @@
+#!/usr/bin/python3
+"""Proves, for all inputs, what the comments of the tool's arithmetic say of it (z3); the functions are
+read from the sources. Fails when one of them does something else."""
+import sys
+
+import z3
+
+from cpp_function import Pointer, Runs, Word, load
+
+HALF = 0xFFFF
+LIMB_BITS = 32
+
+
+def word(name, bits=LIMB_BITS):
+    return Word(z3.BitVec(name, bits))
+
+
+def wide(value):
+    """With room for sums of products of two limbs."""
+    term = value.term if isinstance(value, Word) else value
+    return z3.ZeroExt(72 - term.size(), term)
+
+
+def always(assumptions, *claims):
+    solver = z3.Solver()
+    solver.add(*assumptions)
+    solver.add(z3.Not(z3.And(*claims)))
+    if solver.check() != z3.unsat:
+        raise AssertionError(f"not for {solver.model()}")
+
+
+def is_same(a, b):
+    solver = z3.Solver()
+    solver.add(a.term != b.term)
+    return solver.check() == z3.unsat
+
+
+def multiply_add_equals_the_wide_product_plus_both_addends():
+    s, d, b, c = word("s"), word("d"), word("b"), word("c")
+    function = load("crypto/mpi.cpp", "multiply_add", kCount=1, kMpiLimbBits=LIMB_BITS)
+    halves = {(x, n): (y >> (16 * n)) & HALF for x, y in (("s", s), ("b", b)) for n in (0, 1)}
+    products = {}
+
+    # The product of a half of s and a half of b, an unknown number as great as such a product may be.
+    def product(left, right):
+        m = next(n for n in (0, 1) if is_same(left, halves["s", n]))
+        n = next(n for n in (0, 1) if is_same(right, halves["b", n]))
+        return products.setdefault((m, n), word(f"product{m}{n}"))
+
+    Word.product = product
+    place = Pointer(d)
+    carry = function(Pointer(s), place, b, c)
+    whole = sum((wide(p) << (16 * (m + n)) for (m, n), p in products.items()), wide(c) + wide(d))
+    always([z3.ULE(p.term, HALF * HALF) for p in products.values()],
+           (wide(carry) << LIMB_BITS) + wide(place[0]) == whole)
+    assert len(products) == 4
+
+
+def half_digit_is_quotient_and_remainder():
+    rest, half, d = word("rest"), word("next"), word("d")
+    function = load("crypto/mpi.cpp", "half_digit")
+    given = [z3.UGE(d.term, 1 << 31), z3.ULT(rest.term, d.term), z3.ULE(half.term, HALF)]
+    high, low = d >> 16, d & HALF
+    # rest = estimate * high + left; `taken` and `to_take` are the products of the estimate with the
+    # halves of d. No rest comes to 2^16 + 2 times `high`, so the estimate is less than that, and the
+    # second product fits in a limb.
+    estimate, left, taken, to_take = word("estimate"), word("left"), word("taken"), word("to_take")
+    always(given, z3.UGT(wide(high) * (HALF + 3), wide(rest)))
+    given += [z3.ULE(estimate.term, HALF + 2), z3.ULT(left.term, high.term),
+              z3.ULE(taken.term, rest.term), rest.term == taken.term + left.term]
+    always(given, z3.ULT(wide(estimate) * HALF, 1 << LIMB_BITS))
+    given += [z3.ULE(wide(to_take), wide(estimate) * HALF)]
+
+    def quotient(a, b):
+        assert is_same(a, rest) and is_same(b, high)
+        return estimate
+
+    def product(a, b):
+        assert is_same(a, estimate) and (is_same(b, high) or is_same(b, low))
+        return taken if is_same(b, high) else to_take
+
+    def run():
+        place = Pointer(rest)
+        return function(place, half, d), place[0]
+
+    Word.quotient, Word.product = quotient, product
+    # The dividend is rest * 2^16 + next; less estimate * d, it is left * 2^16 + next - to_take.
+    difference = (wide(left) << 16) + wide(half) - wide(to_take)
+    for holds, (digit, remainder) in Runs(run, given):
+        less = wide(estimate) - wide(digit)
+        given_back = z3.If(less == 0, 0, z3.If(less == 1, wide(d), 2 * wide(d)))
+        always(holds, z3.ULE(less, 2), z3.ULT(remainder.term, d.term),
+               wide(remainder) == difference + given_back)
+    # And so the digit is the quotient, which is one half limb.
+    always(given, z3.ULT((wide(rest) << 16) + wide(half), wide(d) << 16))
+
+
+def plain_text_is_eight_bytes_above_the_line_ends():
+    eight = word("eight", 64)
+    function = load("apk/manifest_mf.cpp", "IsPlainText")
+    expected = z3.And(*(z3.UGT(z3.Extract(8 * i + 7, 8 * i, eight.term), ord("\r"))
+                        for i in range(8)))
+    always([], function(Pointer(eight)).condition == expected)
+
+
+class Power:
+    """A power of one number, by its exponent: a product adds the exponents."""
+
+    def __init__(self, exponent):
+        self.exponent = exponent
+
+
+class Table:
+    """The powers that were made for a window of w bits."""
+
+    def __init__(self, w):
+        self.w = w
+
+    def __getitem__(self, index):
+        assert index == 1 or 1 << (self.w - 1) <= index < 1 << self.w, index
+        return Power(index)
+
+
+class Number:
+    def __init__(self, value):
+        self.value = value
+        self.p = [value & 0xFFFFFFFF, value >> LIMB_BITS]
+
+
+class Montgomery:
+    @staticmethod
+    def multiply(a, b):
+        a.exponent += b.exponent
+
+
+def windows_make_up_the_exponent():
+    """After every window, and after every zero between them, the scan is where it began. So the
+    exponents that hold each window of up to 6 bits, with everything that may follow it up to the
+    next, stand for all; some lie across the limbs."""
+    function = load("crypto/mpi_pow_mod.cpp", "raise", kMpiLimbBits=LIMB_BITS,
+                    mpi_msb=lambda number: number.value.bit_length())
+    for w in (1, 3, 4, 5, 6):
+        for value in range(1 << (2 * w + 1)):
+            for shift in (0, LIMB_BITS - w):
+                power = Power(0)
+                function(power, Number(value << shift), Table(w), w, Montgomery)
+                assert power.exponent == value << shift, (w, value << shift)
+
+
+PROOFS = (multiply_add_equals_the_wide_product_plus_both_addends,
+          half_digit_is_quotient_and_remainder,
+          plain_text_is_eight_bytes_above_the_line_ends,
+          windows_make_up_the_exponent)
+
+
+def main():
+    status = 0
+    for proof in PROOFS:
+        name = proof.__name__.replace("_", " ")
+        try:
+            proof()
+            print(f"proved: {name}", flush=True)
+        except Exception as error:  # whatever keeps it from being proved
+            print(f"NOT PROVED: {name}: {error!r}", flush=True)
+            status = 1
+    return status
+
+
+if __name__ == "__main__":
+    sys.exit(main())
