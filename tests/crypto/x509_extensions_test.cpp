@@ -145,6 +145,14 @@ TEST(X509Extensions, InAVersion2CertificateAreMinus15) {
   EXPECT_EQ(ResultOf(certificate), 0);
 }
 
+TEST(X509Extensions, BitsOfThoseThatArePresentAreTheFirstFive) {
+  EXPECT_EQ(kX509BasicConstraints, 1u);
+  EXPECT_EQ(kX509PathLenConstraint, 2u);
+  EXPECT_EQ(kX509KeyUsage, 4u);
+  EXPECT_EQ(kX509SubjectAltName, 8u);
+  EXPECT_EQ(kX509IssuerAltName, 16u);
+}
+
 TEST(X509KeyUsage, NamedBitsCountFromTheFirst) {
   // keyCertSign (5), cRLSign (6) and decipherOnly (8).
   const ParsedCertificate parsed(With({Extension(kKeyUsage, der::BitString({0x06, 0x80}, 7))}));

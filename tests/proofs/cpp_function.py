@@ -134,10 +134,15 @@ class Pointer:
         self.values[index] = value
 
 
+def code(path):
+    """The source file without its comments and preprocessor lines."""
+    return re.sub(r"//[^\n]*|^#[^\n]*", "", (ROOT / path).read_text(), flags=re.M)
+
+
 def load(path, name, **constants):
     """The function `name` of the source file, as one of Python's, whose globals are the constants
     of the file that are numbers, and `constants`."""
-    text = re.sub(r"//[^\n]*|^#[^\n]*", "", (ROOT / path).read_text(), flags=re.M)
+    text = code(path)
     scope = {"Pointer": Pointer, **constants}
     for constant, value in re.findall(r"constexpr \w+ (k\w+) = ([^;{}]+);\n", text):
         try:
@@ -212,8 +217,8 @@ def expression(text):
     text = re.sub(r"static_cast<[^<>]*>", "", text)
     text = re.sub(r"(?<![\w)\]] )(?<![\w)\]])\*(\w+)", r"\1[0]", text)  # what a pointer points at
     text = re.sub(r"&(\w+)(?=[,)\[])", r"\1", text)  # an address that a call is given
-    for cpp, python in (("->", "."), ("std::", ""), ("&&", " and "), ("||", " or "), (" / ", " // "),
-                        ("false", "False"), ("true", "True")):
+    for cpp, python in (("->", "."), ("std::", ""), ("&&", " and "), ("||", " or "),
+                        (" / ", " // "), ("false", "False"), ("true", "True")):
         text = text.replace(cpp, python)
     text = re.sub(r"!(?!=)", " not ", text)
     text = re.sub(r"\b(0[xX][0-9A-Fa-f]+|\d+)[uUlL]+\b", r"\1", text)

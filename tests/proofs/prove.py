@@ -1,11 +1,12 @@
 #!/usr/bin/python3
-"""Proves, for all inputs, what the comments of the tool's arithmetic say of it (z3); the functions are
-read from the sources. Fails when one of them does something else."""
+"""Proves, for all inputs, what the comments of the tool's arithmetic say of it (z3); the functions
+are read from the sources. Fails when one of them does something else."""
+import re
 import sys
 
 import z3
 
-from cpp_function import Pointer, Runs, Word, load
+from cpp_function import Pointer, Runs, Word, code, load
 
 HALF = 0xFFFF
 LIMB_BITS = 32
@@ -41,7 +42,7 @@ def multiply_add_equals_the_wide_product_plus_both_addends():
     halves = {(x, n): (y >> (16 * n)) & HALF for x, y in (("s", s), ("b", b)) for n in (0, 1)}
     products = {}
 
-    # The product of a half of s and a half of b, an unknown number as great as such a product may be.
+    # The product of a half of s and a half of b: an unknown number as great as one may be.
     def product(left, right):
         m = next(n for n in (0, 1) if is_same(left, halves["s", n]))
         n = next(n for n in (0, 1) if is_same(right, halves["b", n]))
@@ -62,8 +63,8 @@ def half_digit_is_quotient_and_remainder():
     given = [z3.UGE(d.term, 1 << 31), z3.ULT(rest.term, d.term), z3.ULE(half.term, HALF)]
     high, low = d >> 16, d & HALF
     # rest = estimate * high + left; `taken` and `to_take` are the products of the estimate with the
-    # halves of d. No rest comes to 2^16 + 2 times `high`, so the estimate is less than that, and the
-    # second product fits in a limb.
+    # halves of d. No rest comes to 2^16 + 2 times `high`, so the estimate is less than that, and
+    # the second product fits in a limb.
     estimate, left, taken, to_take = word("estimate"), word("left"), word("taken"), word("to_take")
     always(given, z3.UGT(wide(high) * (HALF + 3), wide(rest)))
     given += [z3.ULE(estimate.term, HALF + 2), z3.ULT(left.term, high.term),
@@ -147,10 +148,20 @@ def windows_make_up_the_exponent():
                 assert power.exponent == value << shift, (w, value << shift)
 
 
+def no_limb_is_held_in_anything_wider():
+    for path in ("crypto/mpi.h", "crypto/mpi.cpp", "crypto/mpi_pow_mod.cpp"):
+        text = code(path)
+        wider = re.findall(r"\bu?int(?:64|_fast|max)\w*|\w*int128\w*|\blong\b|\bdouble\b", text)
+        assert not wider, (path, wider)
+        lanes = set(re.findall(r"typedef (.*?)\s+lanes\b", text))
+        assert lanes <= {"uint32_t"}, (path, lanes)
+
+
 PROOFS = (multiply_add_equals_the_wide_product_plus_both_addends,
           half_digit_is_quotient_and_remainder,
           plain_text_is_eight_bytes_above_the_line_ends,
-          windows_make_up_the_exponent)
+          windows_make_up_the_exponent,
+          no_limb_is_held_in_anything_wider)
 
 
 def main():
