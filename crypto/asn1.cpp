@@ -124,8 +124,9 @@ bool ReadLength(Octets* octets, asn1_hdr* hdr) {
     hdr->length = octet;
     return true;
   }
-  // 0xFF, reserved, has too large a count as well. Deliberate: the indefinite form, which has a
-  // count of 0, reads as no contents; the element's end is not looked for.
+  // 0xFF, reserved, has too large a count as well. Deliberate: there may be more octets than DER
+  // asks for; and the indefinite form, which has a count of 0, reads as no contents, without a look
+  // for the element's end.
   const uint32_t count = octet & 0x7f;
   if (count > kMaxLengthOctets) return false;
   for (uint32_t i = 0; i < count; ++i) {

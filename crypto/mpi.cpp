@@ -234,7 +234,6 @@ namespace {
 
 // Wipes and frees what X owns; X itself is left pointing at it.
 void release_limbs(mpi* X) {
-  if (X->n == 0) return;
   clear_limbs(X);
   // The compiler must take the zeros for read, or it would drop a store to memory that is freed.
   __asm__ __volatile__("" : : "r"(X->p) : "memory");

@@ -26,8 +26,7 @@ void raise(mpi* X, const mpi* E, const mpi_local* W, int w, montgomery* m);
 }  // namespace
 
 int mpi_pow_mod(mpi* X, const mpi* A, const mpi* E, const mpi* N) {
-  const mpi_local zero;
-  if (mpi_compare(N, &zero) < 0 || N->n == 0 || N->p[0] % 2 == 0) return kMpiBadModulus;
+  if (N->n == 0 || N->p[0] % 2 == 0 || N->s < 0) return kMpiBadModulus;
   const int w = window_size(mpi_msb(E));
   montgomery m = {N, montgomery_constant(N->p[0]), {}};
   mpi_local W[kWindowTableSize];

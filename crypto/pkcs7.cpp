@@ -28,6 +28,7 @@ struct Block {
   size_t Skip(const asn1_hdr& hdr) const { return Enter(hdr) + hdr.length; }
 };
 
+bool ReadBlock(const Block& block, pkcs7* record);
 bool ReadHeaders(const Block& block, asn1_hdr* hdr);
 bool ReadCertificate(const Block& block, const asn1_hdr& certificates,
                      x509_certificate* certificate, pkcs7* record);
@@ -45,27 +46,20 @@ constexpr char kNotAnInteger[] = "PUBLIC KEY ERROR: processing INTEGER tag fail"
 }  // namespace
 
 int processCert(const uint8_t* block, uint32_t length, pkcs7* record) {
-  const Block whole = {block, length};
-  asn1_hdr certificates;
-  if (!ReadHeaders(whole, &certificates)) {
-    Fail("processPKCS7Header() error");
-    return 1;
-  }
-  // Deliberate: a certificate that does not parse has one line, and none for the step.
-  x509_certificate certificate;
-  if (!ReadCertificate(whole, certificates, &certificate, record)) return 1;
-  if (!ReadPublicKey(whole, certificate, record)) {
-    Fail("processPublicKey() error");
-    return 1;
-  }
-  if (!ReadSigner(whole, certificates, record)) {
-    Fail("processSignHeader() error");
-    return 1;
-  }
-  return 0;
+  return ReadBlock({block, length}, record) ? 0 : 1;
 }
 
 namespace {
+
+bool ReadBlock(const Block& block, pkcs7* record) {
+  asn1_hdr certificates;
+  x509_certificate certificate;
+  if (!ReadHeaders(block, &certificates)) return Fail("processPKCS7Header() error");
+  // Deliberate: a certificate that does not parse has one line, and none for the step.
+  if (!ReadCertificate(block, certificates, &certificate, record)) return false;
+  if (!ReadPublicKey(block, certificate, record)) return Fail("processPublicKey() error");
+  return ReadSigner(block, certificates, record) || Fail("processSignHeader() error");
+}
 
 bool Block::Read(size_t offset, size_t bound, asn1_hdr* hdr) const {
   *hdr = {};
@@ -101,6 +95,7 @@ WRAPS_ON_PURPOSE bool ReadHeaders(const Block& block, asn1_hdr* hdr) {
               reinterpret_cast<void*>(offset));
 }
 
+// Deliberate: of several certificates the first is the signer's, whoever the signer names.
 bool ReadCertificate(const Block& block, const asn1_hdr& certificates,
                      x509_certificate* certificate, pkcs7* record) {
   const size_t available = block.length - block.Enter(certificates);

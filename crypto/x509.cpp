@@ -66,8 +66,6 @@ int ParseOptionalFields(Range tbs, x509_certificate* cert);
 bool ParseExtension(Range extension, x509_certificate* cert);
 bool ReadExtensionValue(Range extension, bool* critical, Range* value);
 bool ParseKeyUsage(Range value, x509_certificate* cert);
-bool ParseSubjectAltName(Range value, x509_certificate* cert);
-bool ParseIssuerAltName(Range value, x509_certificate* cert);
 bool ParseAltName(Range value, uint32_t present, x509_name* name, x509_certificate* cert);
 bool ParseBasicConstraints(Range value, x509_certificate* cert);
 int x509_parse_ext_alt_name(x509_name* name, const uint8_t* buf, size_t len);
@@ -93,19 +91,6 @@ constexpr KnownAttribute kAttributes[] = {
 };
 
 constexpr KnownAttribute kEmailAddress = {0, 7, {1, 2, 840, 113549, 1, 9, 1}};
-
-// The extensions that are understood: the fourth arc after 2.5.29, and how the value is read.
-struct KnownExtension {
-  uint32_t arc;
-  bool (*parse)(Range value, x509_certificate* cert);
-};
-
-constexpr KnownExtension kExtensions[] = {
-    {15, ParseKeyUsage},
-    {17, ParseSubjectAltName},
-    {18, ParseIssuerAltName},
-    {19, ParseBasicConstraints},
-};
 
 // The tags of the alternative names that are kept (RFC 5280 §4.2.1.6).
 constexpr uint32_t kRfc822Name = 1;
@@ -254,7 +239,8 @@ int TwoDigits(const uint8_t* digits) {
   return tens < 0 || tens > 9 || ones < 0 || ones > 9 ? -1 : tens * 10 + ones;
 }
 
-// The two forms of RFC 5280 §4.1.2.5: UTC, with seconds and without fractions of them.
+// The two forms of RFC 5280 §4.1.2.5: UTC, with seconds and without fractions of them. Deliberate:
+// nobody reads the times, and no number is too large for its field.
 int x509_parse_time(const uint8_t* value, size_t len, uint32_t tag, x509_parser_time* time) {
   constexpr size_t kAfterYear = sizeof("MMDDHHMMSSZ") - 1;
   const size_t year_digits = tag == kAsn1UtcTime ? 2 : 4;
@@ -320,12 +306,19 @@ bool ParseExtension(Range extension, x509_certificate* cert) {
   Range value;
   if (!NextOid(&extension, &id) || !ReadExtensionValue(extension, &critical, &value)) return false;
   // Deliberate: arcs after the fourth make no difference.
-  if (id.len >= 4 && id.oid[0] == 2 && id.oid[1] == 5 && id.oid[2] == 29) {
-    for (const KnownExtension& known : kExtensions) {
-      if (id.oid[3] == known.arc) return known.parse(value, cert);
-    }
+  const bool is_known = id.len >= 4 && id.oid[0] == 2 && id.oid[1] == 5 && id.oid[2] == 29;
+  switch (is_known ? id.oid[3] : 0) {
+    case 15:
+      return ParseKeyUsage(value, cert);
+    case 17:
+      return ParseAltName(value, kX509SubjectAltName, &cert->subject, cert);
+    case 18:
+      return ParseAltName(value, kX509IssuerAltName, &cert->issuer, cert);
+    case 19:
+      return ParseBasicConstraints(value, cert);
+    default:
+      return !critical;
   }
-  return !critical;
 }
 
 // Critical flag and value of an extension, which start `extension`.
@@ -355,14 +348,6 @@ bool ParseKeyUsage(Range value, x509_certificate* cert) {
   cert->extensions_present |= kX509KeyUsage;
   cert->key_usage = static_cast<uint32_t>(asn1_bit_string_to_long(hdr.payload, hdr.length));
   return true;
-}
-
-bool ParseSubjectAltName(Range value, x509_certificate* cert) {
-  return ParseAltName(value, kX509SubjectAltName, &cert->subject, cert);
-}
-
-bool ParseIssuerAltName(Range value, x509_certificate* cert) {
-  return ParseAltName(value, kX509IssuerAltName, &cert->issuer, cert);
 }
 
 bool ParseAltName(Range value, uint32_t present, x509_name* name, x509_certificate* cert) {
