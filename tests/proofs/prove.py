@@ -123,9 +123,11 @@ class Table:
 
 
 class Number:
+    """With the limbs that the value needs and no more."""
+
     def __init__(self, value):
         self.value = value
-        self.p = [value & 0xFFFFFFFF, value >> LIMB_BITS]
+        self.p = [value >> i & 0xFFFFFFFF for i in range(0, value.bit_length(), LIMB_BITS)]
 
 
 class Montgomery:
