@@ -227,6 +227,17 @@ TEST(MpiShiftL, ByWholeLimbsMovesThemAndGrowsAsNeeded) {
   EXPECT_EQ(-Magnitude(5, expected), Value(X));
 }
 
+TEST(MpiShiftL, GrowsToJustTheLimbsThatTheProductNeeds) {
+  const std::tuple<Limbs, int, int> cases[] = {
+      {{1}, 31, 1}, {{1}, 32, 2}, {{0x80000000}, 32, 2}, {{0x80000000}, 33, 3}, {{}, 0, 0},
+      {{}, 1, 1},   {{}, 32, 1},  {{}, 33, 2},           {{1, 0}, 5, 2}};
+  for (const auto& [limbs, count, expected] : cases) {
+    Number X(limbs);
+    EXPECT_EQ(0, mpi_shift_l(&X, count));
+    EXPECT_EQ(expected, X.n) << limbs.size() << " limbs by " << count;
+  }
+}
+
 TEST(MpiShiftL, MultipliesByAPowerOfTwo) {
   Operands operands;
   for (int round = 0; round < kRounds; ++round) {
@@ -389,6 +400,12 @@ TEST(Mpi, ReportsEachAllocationThatFails) {
   ExpectNoMemoryAtEveryAllocation([&] {
     Number R;
     return mpi_mod_mpi(&R, &A, &B);
+  });
+  // A remainder that is negative at first.
+  const Number divisor({7, 0xffff});
+  ExpectNoMemoryAtEveryAllocation([&] {
+    Number R;
+    return mpi_mod_mpi(&R, &A, &divisor);
   });
 }
 
