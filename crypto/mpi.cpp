@@ -25,7 +25,7 @@ uint32_t add_limbs(int count, const uint32_t* s, uint32_t* d);
 uint32_t subtract_limbs(int count, const uint32_t* s, uint32_t* d);
 void subtract_with_borrow(int count, const uint32_t* s, uint32_t* d);
 template <int kCount>
-uint32_t multiply_add(const uint32_t* s, uint32_t* d, uint32_t b, uint32_t c);
+WRAPS_ON_PURPOSE uint32_t multiply_add(const uint32_t* s, uint32_t* d, uint32_t b, uint32_t c);
 int reduce(mpi* X, const mpi* B);
 uint32_t quotient_digit(const mpi* X, int i, const mpi* Y, int t);
 uint32_t estimate_digit(uint32_t high, uint32_t low, uint32_t d);
