@@ -40,10 +40,8 @@ int mpi_pow_mod(mpi* X, const mpi* A, const mpi* E, const mpi* N) {
   if (const int result = mpi_assign(&RR, &one)) return result;
   if (const int result = mpi_shift_l(&RR, 2 * kMpiLimbBits * N->n)) return result;
   if (const int result = mpi_mod_mpi(&RR, &RR, N)) return result;
-  if (const int result = m.copy(&W[1], A)) return result;
-  if (mpi_compare(A, N) >= 0) {
-    if (const int result = mpi_mod_mpi(&W[1], A, N)) return result;
-  }
+  if (const int result = mpi_grow(&W[1], N->n + 1)) return result;
+  if (const int result = mpi_mod_mpi(&W[1], A, N)) return result;
   m.multiply(&W[1], &RR);
   if (const int result = m.copy(X, &RR)) return result;
   m.multiply(X, &one);
