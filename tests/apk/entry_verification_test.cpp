@@ -13,7 +13,7 @@
 
 using ApkTools::Apk;
 
-// The linker sends the tool's calls of read here.
+// The linker sends the tool's calls of read here, those of a build with _FORTIFY_SOURCE included.
 static std::function<void()> before_read;
 
 extern "C" ssize_t __real_read(int fd, void* buffer, size_t size);
@@ -21,6 +21,10 @@ extern "C" ssize_t __real_read(int fd, void* buffer, size_t size);
 extern "C" ssize_t __wrap_read(int fd, void* buffer, size_t size) {
   if (before_read) before_read();
   return __real_read(fd, buffer, size);
+}
+
+extern "C" ssize_t __wrap___read_chk(int fd, void* buffer, size_t size, size_t /*room*/) {
+  return __wrap_read(fd, buffer, size);
 }
 
 namespace {

@@ -8,7 +8,8 @@
 // excepted.
 //
 // The names are malloc, open, read, fopen, readlink, fgetxattr, fstatvfs and fcntl. A function
-// under several names (open and open64) counts as one, as do malloc, calloc and realloc.
+// under several names (open, open64 and the checked __open_2) counts as one, as do malloc, calloc
+// and realloc.
 #include <dlfcn.h>
 #include <fcntl.h>
 #include <signal.h>
@@ -115,9 +116,18 @@ extern "C" ssize_t read(int fd, void* buffer, size_t size) {
   static auto* const next = NextFunction<ssize_t(int, void*, size_t)>("read");
   return Fails("read", EIO, __builtin_return_address(0)) ? -1 : next(fd, buffer, size);
 }
+extern "C" ssize_t __read_chk(int fd, void* buffer, size_t size, size_t room) {
+  static auto* const next = NextFunction<ssize_t(int, void*, size_t, size_t)>("__read_chk");
+  return Fails("read", EIO, __builtin_return_address(0)) ? -1 : next(fd, buffer, size, room);
+}
 extern "C" ssize_t readlink(const char* path, char* buffer, size_t size) {
   static auto* const next = NextFunction<ssize_t(const char*, char*, size_t)>("readlink");
   return Fails("readlink", EIO, __builtin_return_address(0)) ? -1 : next(path, buffer, size);
+}
+extern "C" ssize_t __readlink_chk(const char* path, char* buffer, size_t size, size_t room) {
+  static auto* const next =
+      NextFunction<ssize_t(const char*, char*, size_t, size_t)>("__readlink_chk");
+  return Fails("readlink", EIO, __builtin_return_address(0)) ? -1 : next(path, buffer, size, room);
 }
 extern "C" ssize_t fgetxattr(int fd, const char* name, void* value, size_t size) {
   static auto* const next = NextFunction<ssize_t(int, const char*, void*, size_t)>("fgetxattr");
@@ -158,6 +168,10 @@ extern "C" int open64(const char* path, int flags, ...) {
   const auto mode = va_arg(arguments, mode_t);
   va_end(arguments);
   return Fails("open", EMFILE, __builtin_return_address(0)) ? -1 : next(path, flags, mode);
+}
+extern "C" int __open_2(const char* path, int flags) {
+  static auto* const next = NextFunction<int(const char*, int)>("__open_2");
+  return Fails("open", EMFILE, __builtin_return_address(0)) ? -1 : next(path, flags);
 }
 
 extern "C" int fcntl(int fd, int command, ...) {

@@ -75,6 +75,9 @@ int __wrap_open(const char* path, int flags, ...) {
   return -1;
 }
 
+// What open is called in a build with _FORTIFY_SOURCE, as every platform tree has.
+int __wrap___open_2(const char* path, int flags) { return __wrap_open(path, flags); }
+
 FILE* __wrap_fopen(const char* path, const char* mode) {
   if (phone == nullptr || !IsIntegrityFile(path)) return __real_fopen(path, mode);
   if (phone->before_integrity) phone->before_integrity();
@@ -126,6 +129,10 @@ ssize_t __wrap_readlink(const char* path, char* buffer, size_t size) {
     return -1;
   }
   return __real_readlink(path, buffer, size);
+}
+
+ssize_t __wrap___readlink_chk(const char* path, char* buffer, size_t size, size_t /*room*/) {
+  return __wrap_readlink(path, buffer, size);
 }
 
 int ZuNewCertificate(int fd, const char* name, const unsigned char* data, size_t length) {

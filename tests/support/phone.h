@@ -1,8 +1,9 @@
 // What only the phone has, inside the test program: the kernel's integrity feature and libzu.
 //
 // A program that links this file and asks the linker to wrap open, fcntl, fopen, usleep, fgetxattr
-// and readlink (target `phone` does) has a Phone to set up and to read afterwards. Without a living
-// Phone every wrapped call goes to the real system, and libzu refuses.
+// and readlink, and the checked forms of open and readlink (target `phone` does), has a Phone to
+// set up and to read afterwards. Without a living Phone every wrapped call goes to the real system,
+// and libzu refuses.
 #pragma once
 
 #include <cstdint>

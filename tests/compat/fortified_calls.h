@@ -1,0 +1,38 @@
+// The calls that Bionic's headers give another name in a build with _FORTIFY_SOURCE, as every
+// platform tree has: here they get it too (preset `fortify`), so that what the tests wrap is seen to
+// be what a program calls there. The C library of the workstation has the same functions, but its
+// headers call them in rare cases only.
+//
+// Included before everything else in every file, by the compiler's -include. A function whose
+// parameter carries an object's size is another overload of the library's, and goes before it.
+#pragma once
+
+#include <fcntl.h>
+#include <unistd.h>
+
+#define FORTIFIED_CALL static inline __attribute__((always_inline, unused))
+#define WITH_SIZE __attribute__((pass_object_size(0)))
+
+extern "C" {
+int __open_2(const char* path, int flags);
+ssize_t __read_chk(int fd, void* buffer, size_t size, size_t buffer_size);
+ssize_t __readlink_chk(const char* path, char* buffer, size_t size, size_t buffer_size);
+}
+
+FORTIFIED_CALL int open(const char* const path WITH_SIZE, int flags)
+    __attribute__((enable_if(true, ""))) {
+  return __open_2(path, flags);
+}
+
+FORTIFIED_CALL ssize_t read(int fd, void* const buffer WITH_SIZE, size_t size)
+    __attribute__((enable_if(true, ""))) {
+  return __read_chk(fd, buffer, size, __builtin_object_size(buffer, 0));
+}
+
+FORTIFIED_CALL ssize_t readlink(const char* path, char* const buffer WITH_SIZE, size_t size)
+    __attribute__((enable_if(true, ""))) {
+  return __readlink_chk(path, buffer, size, __builtin_object_size(buffer, 0));
+}
+
+#undef FORTIFIED_CALL
+#undef WITH_SIZE
