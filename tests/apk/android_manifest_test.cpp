@@ -55,8 +55,9 @@ bool Asks(const std::string& element, const std::vector<XmlAttribute>& attribute
 
 TEST(AndroidManifestPackage, ItIsTheManifestsAttributeInEitherEncoding) {
   for (const auto pool : {CompiledXml::Pool::kUtf8, CompiledXml::Pool::kUtf16}) {
-    EXPECT_EQ(Read(CompiledXml(pool).Element("manifest", {Package("com.example.\u00fc\u20ac")})),
-              (Facts{"com.example.\u00fc\u20ac", false}));
+    EXPECT_EQ(Read(CompiledXml(pool).Element("manifest",
+                                             {Package("com.example.\u00fc\u20ac\U0001f600")})),
+              (Facts{"com.example.\u00fc\u20ac\U0001f600", false}));
   }
 }
 

@@ -1,7 +1,7 @@
 // The calls that Bionic's headers give another name in a build with _FORTIFY_SOURCE, as every
-// platform tree has: here they get it too (preset `fortify`), so that what the tests wrap is seen to
-// be what a program calls there. The C library of the workstation has the same functions, but its
-// headers call them in rare cases only.
+// platform tree has: here they get it too (preset `fortify`), so that what the tests wrap is seen
+// to be what a program calls there. The C library of the workstation has the same functions, but
+// its headers call them in rare cases only.
 //
 // Included before everything else in every file, by the compiler's -include. A function whose
 // parameter carries an object's size is another overload of the library's, and goes before it.

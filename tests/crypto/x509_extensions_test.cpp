@@ -258,7 +258,8 @@ TEST(X509AltName, ALaterNameOfTheSameKindReplacesAnEarlierOne) {
 }
 
 TEST(X509AltName, EmptySequenceIsPresent) {
-  for (const auto& [oid, bit] : {std::pair(kSubjectAltName, 8u), std::pair(kIssuerAltName, 16u)}) {
+  for (const auto& [oid, bit] :
+       {std::make_pair(kSubjectAltName, 8u), std::make_pair(kIssuerAltName, 16u)}) {
     const ParsedCertificate parsed(With({Extension(oid, der::Sequence({}))}));
     EXPECT_EQ(parsed.result, 0);
     EXPECT_EQ(parsed.cert.extensions_present, bit);

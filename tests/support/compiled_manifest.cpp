@@ -1,8 +1,6 @@
 #include "support/compiled_manifest.h"
 
 #include <algorithm>
-#include <codecvt>
-#include <locale>
 
 #include "support/little_endian.h"
 
@@ -25,8 +23,18 @@ void PutChunkHeader(Bytes& out, uint16_t type, uint16_t header_length, size_t le
   Put32(out, static_cast<uint32_t>(length));
 }
 
+// Of UTF-8 that is in order. The C++ library's own conversion is deprecated, and newer ones warn.
 std::u16string ToUtf16(const std::string& text) {
-  return std::wstring_convert<std::codecvt_utf8_utf16<char16_t>, char16_t>().from_bytes(text);
+  std::u16string units;
+  for (size_t at = 0; at < text.size();) {
+    const auto first = static_cast<uint8_t>(text[at++]);
+    const int more = first < 0x80 ? 0 : first < 0xe0 ? 1 : first < 0xf0 ? 2 : 3;
+    uint32_t code = more == 0 ? first : first & (0x3fu >> more);
+    for (int i = 0; i < more; ++i) code = code << 6 | (static_cast<uint8_t>(text.at(at++)) & 0x3f);
+    if (code > 0xffff) units.push_back(static_cast<char16_t>(0xd800 + ((code - 0x10000) >> 10)));
+    units.push_back(static_cast<char16_t>(code > 0xffff ? 0xdc00 + (code & 0x3ff) : code));
+  }
+  return units;
 }
 
 // A length of the UTF-8 pool: one byte, or two of which the first has its highest bit set.

@@ -1,7 +1,6 @@
 #include "support/files.h"
 
 #include <ftw.h>
-#include <gtest/gtest.h>
 #include <linux/memfd.h>
 #include <sys/stat.h>
 #include <sys/syscall.h>
@@ -20,12 +19,18 @@ namespace {
   abort();
 }
 
+// The one that the environment names, a workstation's, or a phone's.
+std::string TemporaryFolder() {
+  if (const char* const named = getenv("TMPDIR"); named != nullptr) return named;
+  return access("/tmp", W_OK) == 0 ? "/tmp" : "/data/local/tmp";
+}
+
 int RemoveOne(const char* path, const struct stat*, int, FTW*) { return remove(path); }
 
 }  // namespace
 
 TempDir::TempDir(const std::string& parent) {
-  const std::string place = parent.empty() ? testing::TempDir() : parent;
+  const std::string place = parent.empty() ? TemporaryFolder() : parent;
   char* const resolved = realpath(place.c_str(), nullptr);
   if (resolved == nullptr) GiveUp(place);
   path_ = resolved + std::string("/apktoolkit-XXXXXX");

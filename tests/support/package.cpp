@@ -89,7 +89,8 @@ void Package::Tamper(const std::string& name) {
 void Package::WriteTo(const std::string& path) const { WriteFile(path, Build()); }
 
 Bytes ModulusOf(const std::string& key) {
-  const BIGNUM* modulus = RSA_get0_n(TestRsaKey(key));
+  const BIGNUM* modulus = nullptr;
+  RSA_get0_key(TestRsaKey(key), &modulus, nullptr, nullptr);
   Bytes bytes(BN_num_bytes(modulus));
   BN_bn2bin(modulus, bytes.data());
   return bytes;
