@@ -1,11 +1,13 @@
 #!/usr/bin/env python3
-"""Holds the file lists of the Android.bp files against those of CMake, and both against the folders."""
+"""Holds the platform's build against CMake's: the file lists of both, which are also held against the
+folders, what the linker wraps for a test, and what a blueprint may say in a tree of Android 8.1."""
 
 import pathlib
 import re
 import sys
 
-from sources import ROOMS, ROOT, report, tool_sources, without_comments
+from blueprint import Blueprint
+from sources import ROOMS, ROOT, report, tool_sources
 
 # What needs more than a phone has, and so is in the workstation's build alone.
 WORKSTATION_ONLY = {
@@ -24,81 +26,31 @@ WORKSTATION_ONLY = {
     "fuzz/package_fuzz.cpp": "has the linker wrap a call of the zip library",
 }
 
-TOKEN = re.compile(r'"((?:[^"\\]|\\.)*)"|([A-Za-z_]\w*|\d+)|([{}\[\]:,=+])|(\S)')
+# The words that the build of Android 8.1 knows. An unknown one stops the whole tree.
+KNOWN_TYPES = {"cc_binary", "cc_defaults", "cc_library_shared", "cc_library_static", "cc_test",
+               "filegroup"}
+KNOWN_PROPERTIES = {"cflags", "compile_multilib", "cpp_std", "data", "defaults",
+                    "export_include_dirs", "ldflags", "local_include_dirs", "name", "shared_libs",
+                    "srcs", "static_libs"}
 
-
-class Blueprint:
-    """The modules of an Android.bp file: each a dictionary, its type under the key "type"."""
-
-    def __init__(self, path):
-        self.path = path
-        self.tokens = [(m[1], m[2] or m[3] or m[4])
-                       for m in TOKEN.finditer(without_comments(path.read_text()))]
-        self.modules = []
-        while self.tokens:
-            kind = self.word()
-            self.modules.append({"type": kind, **self.value()})
-
-    def word(self, expected=None):
-        text, word = self.tokens.pop(0)
-        if text is not None or (expected and word != expected):
-            sys.exit(f"{self.path}: found {text or word!r} where {expected or 'a word'} should be")
-        return word
-
-    def value(self):
-        text, word = self.tokens.pop(0)
-        if text is not None:
-            return text
-        if word == "[":
-            return list(self.items("]", self.value))
-        if word == "{":
-            return dict(self.items("}", self.property))
-        return {"true": True, "false": False}.get(word, word)
-
-    def property(self):
-        key = self.word()
-        self.word(":")
-        return key, self.value()
-
-    def items(self, end, read):
-        while self.tokens[0][1] != end:
-            yield read()
-            if self.tokens[0][1] != end:
-                self.word(",")
-        self.word(end)
-
-    def sources(self, name):
-        found = [m for m in self.modules if m.get("name") == name]
-        if len(found) != 1:
-            sys.exit(f"{self.path}: {len(found)} modules are named {name}")
-        folder = self.path.parent.relative_to(ROOT)
-        return sorted(str(folder / source) for source in found[0]["srcs"])
-
-
-    def all_sources(self, kind):
-        folder = self.path.parent.relative_to(ROOT)
-        return [str(folder / source) for module in self.modules if module["type"] == kind
-                for source in module["srcs"]]
-
-
-def cmake_sources(target, folder="."):
-    path = ROOT / folder / "CMakeLists.txt"
-    found = re.search(r"(?:add_library|add_executable|apktoolkit_add_test)\(%s\s+([^)]*)\)" % target,
-                      re.sub(r"#.*", "", path.read_text()))
-    if not found:
-        sys.exit(f"{path} has no target {target}")
-    return sorted(str(pathlib.Path(folder, word)) for word in found[1].split()
-                  if word.endswith(".cpp"))
-
-
-def compare(name, left, right, problems):
-    for source in sorted(set(left) ^ set(right)):
-        problems.append(f"{name}: {source} stands on one side only")
+# For headers that are the system's here and the user's there.
+PLATFORM_ONLY_FLAGS = {"-Wno-sign-conversion"}
 
 
 def main():
     problems = []
     platform = Blueprint(ROOT / "Android.bp")
+    tests = Blueprint(ROOT / "tests/Android.bp")
+    fuzz = Blueprint(ROOT / "fuzz/cc_fuzz.bp")
+    hold_tool(platform, problems)
+    hold_tests(tests, fuzz, problems)
+    hold_flags(platform, problems)
+    hold_wraps(tests, problems)
+    hold_words(platform, tests, problems)
+    return report(problems)
+
+
+def hold_tool(platform, problems):
     core = cmake_sources("apktoolkit_core")
     compare("apktoolkit_core", platform.sources("apktoolkit_core"), core, problems)
     compare("apktoolkit", platform.sources("apktoolkit"), cmake_sources("apktoolkit"), problems)
@@ -106,21 +58,76 @@ def main():
     listed = core + cmake_sources("apktoolkit") + cmake_sources("zu")
     compare("the tool's folders", listed, map(str, tool_sources()), problems)
 
-    tests = Blueprint(ROOT / "tests/Android.bp")
+
+def hold_tests(tests, fuzz, problems):
     compare("apktoolkit_test_support", tests.sources("apktoolkit_test_support"),
             cmake_sources("test_support", "tests/support"), problems)
-    both = [source for room in ROOMS for source in cmake_sources(f"{room}_test", f"tests/{room}")]
-    on_phone = tests.all_sources("cc_test")
-    fuzz = Blueprint(ROOT / "fuzz/Android.bp")
     compare("apktoolkit_fuzz_support", fuzz.sources("apktoolkit_fuzz_support"),
             cmake_sources("fuzz_support", "fuzz"), problems)
+    both = [source for room in ROOMS for source in cmake_sources(f"{room}_test", f"tests/{room}")]
     both += [str(path.relative_to(ROOT)) for path in (ROOT / "fuzz").glob("*_fuzz.cpp")]
-    on_phone += fuzz.all_sources("cc_fuzz")
+    on_phone = tests.all_sources("cc_test") + fuzz.all_sources("cc_fuzz")
     shared = {"tests/support/phone.cpp", "fuzz/quiet_log.cpp"}
     compare("tests and fuzz targets", set(on_phone) - shared | set(WORKSTATION_ONLY), both, problems)
     problems += [f"{source} is in a module, and named as the workstation's own"
                  for source in set(on_phone) & set(WORKSTATION_ONLY)]
-    return report(problems)
+
+
+def hold_flags(platform, problems):
+    settings = without_comments_of_cmake(ROOT / "cmake/CompilerSettings.cmake")
+    lists = re.findall(r"(?:add_compile_options|set)\((?:APKTOOLKIT_TOOL_OPTIONS )?(-[^)]*)\)",
+                       settings)
+    warnings = {flag for text in lists for flag in text.split() if flag.startswith("-W")}
+    flags = set(platform.module("apktoolkit_defaults")["cflags"])
+    compare("warnings", flags ^ PLATFORM_ONLY_FLAGS, warnings, problems)
+
+
+def hold_wraps(tests, problems):
+    wrapped = {}
+    for path in sorted((ROOT / "tests").glob("*/CMakeLists.txt")):
+        for target, options in re.findall(r"target_link_options\((\w+) ([^)]*)\)",
+                                          without_comments_of_cmake(path)):
+            wrapped[target] = re.findall(r"--wrap=(\w+)", options)
+    for module in tests.modules:
+        if module["type"] != "cc_test":
+            continue
+        name = module["name"]
+        with_phone = "tests/support/phone.cpp" in tests.sources(name)
+        compare(f"what is wrapped for {name}",
+                re.findall(r"--wrap=(\w+)", str(module.get("ldflags"))),
+                wrapped.get("phone" if with_phone else name.replace("apktoolkit_", ""), []),
+                problems)
+
+
+def hold_words(platform, tests, problems):
+    for module in platform.modules + tests.modules:
+        words = {module["type"]} - KNOWN_TYPES
+        words |= set(module) - {"type", "folder"} - KNOWN_PROPERTIES
+        problems += [f"{module['name']}: Android 8.1 does not know {word}" for word in sorted(words)]
+        if module.get("cpp_std", "c++1z") != "c++1z":
+            problems.append(f"{module['name']}: Android 8.1 does not know {module['cpp_std']}")
+    # It reads no other blueprints than those named, later releases read all that there are.
+    compare("blueprints below the first", platform.variables["subdirs"],
+            [path.parent.name for path in ROOT.glob("*/Android.bp")], problems)
+
+
+def cmake_sources(target, folder="."):
+    path = ROOT / folder / "CMakeLists.txt"
+    found = re.search(r"(?:add_library|add_executable|apktoolkit_add_test)\(%s\s+([^)]*)\)" % target,
+                      without_comments_of_cmake(path))
+    if not found:
+        sys.exit(f"{path} has no target {target}")
+    return sorted(str(pathlib.Path(folder, word)) for word in found[1].split()
+                  if word.endswith(".cpp"))
+
+
+def without_comments_of_cmake(path):
+    return re.sub(r"#.*", "", path.read_text())
+
+
+def compare(name, left, right, problems):
+    for item in sorted(set(left) ^ set(right)):
+        problems.append(f"{name}: {item} stands on one side only")
 
 
 if __name__ == "__main__":

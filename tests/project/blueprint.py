@@ -1,0 +1,128 @@
+#!/usr/bin/env python3
+"""Reads Android.bp files: their modules, and how a platform's build compiles each source.
+
+blueprint.py FILE... prints, for every source of these files, a line of the module, the source and
+the compiler's flags for it, as far as the files give them.
+"""
+
+import pathlib
+import re
+import sys
+
+from sources import ROOT, without_comments
+
+TOKEN = re.compile(r'"((?:[^"\\]|\\.)*)"|([A-Za-z_]\w*|\d+)|([{}\[\]:,=+])|(\S)')
+
+# What Android 8.1 compiles C++ as where a module does not say.
+DEFAULT_STANDARD = "gnu++14"
+
+
+class Blueprint:
+    """The modules of a file: each a dictionary, its type under the key "type"; its variables."""
+
+    def __init__(self, path):
+        self.path = path
+        self.folder = path.parent.relative_to(ROOT)
+        self.tokens = [(m[1], m[2] or m[3] or m[4])
+                       for m in TOKEN.finditer(without_comments(path.read_text()))]
+        self.modules = []
+        self.variables = {}
+        while self.tokens:
+            name = self.word()
+            if self.tokens[0][1] == "=":
+                self.word("=")
+                self.variables[name] = self.value()
+            else:
+                self.modules.append({"type": name, "folder": self.folder, **self.value()})
+
+    def word(self, expected=None):
+        text, word = self.tokens.pop(0)
+        if text is not None or (expected and word != expected):
+            sys.exit(f"{self.path}: found {text or word!r} where {expected or 'a word'} should be")
+        return word
+
+    def value(self):
+        text, word = self.tokens.pop(0)
+        if text is not None:
+            return re.sub(r"\\(.)", r"\1", text)
+        if word == "[":
+            return list(self.items("]", self.value))
+        if word == "{":
+            return dict(self.items("}", self.property))
+        return {"true": True, "false": False}.get(word, word)
+
+    def property(self):
+        key = self.word()
+        self.word(":")
+        return key, self.value()
+
+    def items(self, end, read):
+        while self.tokens[0][1] != end:
+            yield read()
+            if self.tokens[0][1] != end:
+                self.word(",")
+        self.word(end)
+
+    def module(self, name):
+        found = [m for m in self.modules if m.get("name") == name]
+        if len(found) != 1:
+            sys.exit(f"{self.path}: {len(found)} modules are named {name}")
+        return found[0]
+
+    def sources(self, name):
+        return sorted(sources(self.module(name)))
+
+    def all_sources(self, kind):
+        return [source for module in self.modules if module["type"] == kind
+                for source in sources(module)]
+
+
+def sources(module):
+    """The module's .cpp files, relative to the root."""
+    return [str(module["folder"] / source) for source in module.get("srcs", [])
+            if source.endswith(".cpp")]
+
+
+class Tree:
+    """The modules of several files, which refer to one another by their names."""
+
+    def __init__(self, paths):
+        self.modules = [module for path in paths for module in Blueprint(path).modules]
+
+    def flags(self, module):
+        """What the files have the compiler told for each source of the module."""
+        module = self.with_defaults(module)
+        folders = self.include_folders(module)
+        return [f"-std={module.get('cpp_std', DEFAULT_STANDARD)}", *module.get("cflags", []),
+                *(f"-I{folder}" for folder in folders)]
+
+    def with_defaults(self, module):
+        """The module with the properties of its defaults, whose lists go before its own."""
+        merged = {}
+        for part in [*map(self.with_defaults, self.named(module.get("defaults", []))), module]:
+            for key, value in part.items():
+                merged[key] = merged.get(key, []) + value if isinstance(value, list) else value
+        return merged
+
+    def include_folders(self, module):
+        """Where it finds headers: in its own folders, and where its static libraries tell."""
+        own = [module["folder"] / name for key in ("local_include_dirs", "export_include_dirs")
+               for name in module.get(key, [])]
+        return own + [library["folder"] / name
+                      for library in self.named(module.get("static_libs", []))
+                      for name in library.get("export_include_dirs", [])]
+
+    def named(self, names):
+        """The modules of these names, as far as they are ours and not the platform's."""
+        return [module for name in names for module in self.modules if module["name"] == name]
+
+
+def main():
+    tree = Tree([ROOT / path for path in sys.argv[1:]])
+    for module in tree.modules:
+        for source in sources(module):
+            print(module["name"], source, *tree.flags(module))
+
+
+if __name__ == "__main__":
+    main()
