@@ -2,17 +2,17 @@
 # /usr/include/android, libraries in the multiarch folder's `android/`. Their headers are system
 # headers (the `cfi` attribute warnings in them are not ours to mend), and their `libcrypto` is the
 # platform's, not the host's, so its folder comes first.
-set(PLATFORM_INCLUDE_DIR ${CMAKE_SYSROOT}/usr/include/android CACHE PATH
-  "Headers of the platform libraries")
+set(PLATFORM_INCLUDE_DIR ${CMAKE_SYSROOT}/usr/include/android CACHE STRING
+  "Headers of the platform libraries: one folder, or a list of them")
 set(PLATFORM_LIBRARY_DIR ${CMAKE_SYSROOT}/usr/lib/${CMAKE_LIBRARY_ARCHITECTURE}/android CACHE PATH
   "Platform libraries")
 
 set(PLATFORM_LIBRARIES ziparchive androidfw utils log crypto)
 foreach(name ${PLATFORM_LIBRARIES})
   find_library(PLATFORM_${name}_LIBRARY ${name}
-    PATHS ${PLATFORM_LIBRARY_DIR} NO_DEFAULT_PATH REQUIRED)
+    PATHS ${PLATFORM_LIBRARY_DIR} NO_DEFAULT_PATH NO_CMAKE_FIND_ROOT_PATH REQUIRED)
   add_library(platform::${name} SHARED IMPORTED)
   set_target_properties(platform::${name} PROPERTIES
     IMPORTED_LOCATION ${PLATFORM_${name}_LIBRARY}
-    INTERFACE_INCLUDE_DIRECTORIES ${PLATFORM_INCLUDE_DIR})
+    INTERFACE_INCLUDE_DIRECTORIES "${PLATFORM_INCLUDE_DIR}")
 endforeach()

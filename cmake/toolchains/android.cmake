@@ -1,6 +1,6 @@
 # 64-bit Arm, API level 27, with any clang and lld and a sysroot of your own, given as
-# -DCMAKE_SYSROOT=DIR: the C and C++ libraries of the target, and below usr/include and usr/lib the
-# platform libraries (or -DPLATFORM_INCLUDE_DIR and -DPLATFORM_LIBRARY_DIR; docs/porting.md).
+# -DCMAKE_SYSROOT=DIR: the C and C++ libraries of the target, and the platform libraries where
+# -DPLATFORM_INCLUDE_DIR and -DPLATFORM_LIBRARY_DIR say (docs/porting.md).
 #
 # The system is called Linux, since CMake's own idea of Android asks for an NDK.
 set(CMAKE_SYSTEM_NAME Linux)
@@ -20,8 +20,11 @@ if(NOT CMAKE_CXX_COMPILER)
 endif()
 set(CMAKE_CXX_COMPILER_TARGET aarch64-linux-android27)
 set(CMAKE_LIBRARY_ARCHITECTURE aarch64-linux-android)
-set(CMAKE_EXE_LINKER_FLAGS_INIT "-fuse-ld=lld")
-set(CMAKE_SHARED_LINKER_FLAGS_INIT "-fuse-ld=lld")
+# The platform's C++ library is libc++, which not every clang takes for this target by itself. Some
+# phones have pages of 16 KiB; what is laid out for those runs on all.
+set(CMAKE_CXX_FLAGS_INIT "-stdlib=libc++")
+set(CMAKE_EXE_LINKER_FLAGS_INIT "-fuse-ld=lld -Wl,-z,max-page-size=16384")
+set(CMAKE_SHARED_LINKER_FLAGS_INIT "-fuse-ld=lld -Wl,-z,max-page-size=16384")
 
 set(CMAKE_FIND_ROOT_PATH_MODE_PROGRAM NEVER)
 set(CMAKE_FIND_ROOT_PATH_MODE_LIBRARY ONLY)
