@@ -1,0 +1,60 @@
+#!/usr/bin/env python3
+"""Has scripts/android look at objects that call what API level 27 lacks, and at one that does not."""
+
+import pathlib
+import subprocess
+import sys
+import tempfile
+
+from sources import ROOT, report
+
+# What came later, as a program calls it, and the name by which the linker knows it.
+LATER = {
+    "int memfd_create(const char*, unsigned);": ("memfd_create", 'memfd_create("", 0)'),
+    "long getrandom(void*, unsigned long, unsigned);": ("getrandom", "getrandom(0, 0, 0)"),
+    "void* reallocarray(void*, unsigned long, unsigned long);": ("reallocarray",
+                                                                 "reallocarray(0, 1, 1) != 0"),
+    "bool _ZNSt3__14__fs10filesystem8__statusERKNS1_4pathEPNS_10error_codeE(void*, void*);": (
+        "std::__1::__fs::filesystem::__status",
+        "_ZNSt3__14__fs10filesystem8__statusERKNS1_4pathEPNS_10error_codeE(0, 0)"),
+}
+EARLIER = 'long read(int, void*, unsigned long); int Own(); int Call() { return Own() + read(0, 0, 0); }'
+OWN = "int Own() { return 1; }"
+
+
+def compiled(folder, name, text):
+    source, built = folder / f"{name}.cpp", folder / f"{name}.o"
+    source.write_text('extern "C" {\n' + text + "\n}\n")
+    subprocess.run(["clang++-14", "--target=aarch64-linux-android27", "-c", source, "-o", built],
+                   check=True)
+    return built
+
+
+def compare(*objects):
+    return subprocess.run([ROOT / "scripts/android", "--symbols", *objects], text=True,
+                          stdout=subprocess.PIPE, stderr=subprocess.STDOUT, check=False)
+
+
+def main():
+    problems = []
+    with tempfile.TemporaryDirectory() as name:
+        folder = pathlib.Path(name)
+        good, own = compiled(folder, "good", EARLIER), compiled(folder, "own", OWN)
+        result = compare(good, own)
+        if result.returncode != 0 or "2 objects" not in result.stdout:
+            problems.append(f"what the level has is refused: {result.stdout}")
+        result = compare(good)
+        if result.returncode != 1 or f"Own called by {good}\n" not in result.stdout:
+            problems.append(f"a function that is nowhere is not noticed: {result.stdout}")
+        for declaration, (symbol, call) in LATER.items():
+            bad = compiled(folder, "bad", f"{declaration} int Later() {{ return {call}; }}")
+            result = compare(good, own, bad)
+            if result.returncode != 1 or symbol not in result.stdout or "read" in result.stdout:
+                problems.append(f"{symbol} is not noticed: {result.stdout}")
+        if compare().returncode == 0:
+            problems.append("no object at all is taken for good ones")
+    return report(problems)
+
+
+if __name__ == "__main__":
+    sys.exit(main())
