@@ -20,9 +20,9 @@ class ManifestMf {
   ManifestMf(ManifestMf&&) = default;
   ManifestMf& operator=(ManifestMf&&) = default;
 
-  // Forgets everything and parses `text`, any bytes (apk/manifest_parser.h). False when it does not
-  // parse; the sections that ended before the fault are there all the same. A text of 4 GiB or
-  // more, which no entry of an archive is, does not parse and is not logged.
+  // Forgets everything and parses `text`, any bytes. False when it does not parse; the sections
+  // that ended before the fault are there all the same. A text of 4 GiB or more, which no entry of
+  // an archive is, does not parse and is not logged.
   bool load(std::vector<uint8_t> text);
   bool load(const std::string& text) {
     return load(std::vector<uint8_t>(text.begin(), text.end()));

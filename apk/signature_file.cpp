@@ -116,22 +116,16 @@ bool Apk::VerifyData(const std::string& digest_name, const std::vector<uint8_t>&
   // Deliberate: these two alone, one of which every manifest has that a package's signing tool
   // wrote. What another tool may have chosen (MD5, SHA-512) is refused. It is otherwise with
   // signatures: old packages have them over MD5, and those verify.
-  struct Algorithm {
-    const char* attribute;
-    void (*compute)(const std::vector<uint8_t>&, std::vector<uint8_t>&);
-  };
-  constexpr Algorithm kAlgorithms[] = {
-      {"SHA1-Digest", ComputeSHA1Digest},
-      {"SHA-256-Digest", ComputeSHA256Digest},
-  };
-  for (const Algorithm& algorithm : kAlgorithms) {
-    if (digest_name != algorithm.attribute) continue;
-    std::vector<uint8_t> computed;
-    algorithm.compute(data, computed);
-    return computed == expected;
+  std::vector<uint8_t> computed;
+  if (digest_name == "SHA1-Digest") {
+    ComputeSHA1Digest(data, computed);
+  } else if (digest_name == "SHA-256-Digest") {
+    ComputeSHA256Digest(data, computed);
+  } else {
+    LogError("verifyData: Unsupported digest type: %s\n", digest_name.c_str());
+    return false;
   }
-  LogError("verifyData: Unsupported digest type: %s\n", digest_name.c_str());
-  return false;
+  return computed == expected;
 }
 
 namespace {

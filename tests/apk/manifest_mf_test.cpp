@@ -133,6 +133,17 @@ TEST(ManifestMf, SeveralLinesContinueAValue) {
             Parse("A: one\r\n two\r\n  three\r\n \r\nB: 2\r\n\r\n"));
 }
 
+// The value is one piece of the text that the manifest owns, right behind its name and ": ".
+TEST(ManifestMf, ContinuationLinesMoveUpBehindWhatTheyContinue) {
+  ManifestMf manifest;
+  EXPECT_TRUE(manifest.load(std::string("A: 1\r\n 23\n 45\r\n\r\n")));
+  ASSERT_EQ(1u, manifest.getSections().size());
+  const auto [name, value] = *manifest.getSections()[0].begin();
+  EXPECT_EQ("A", name);
+  EXPECT_EQ("12345", value);
+  EXPECT_EQ(name.data() + 3, value.data());
+}
+
 TEST(ManifestMf, ContinuationReachesTheValueOfALineWithoutOne) {
   EXPECT_EQ(Sections({{{"Key", "value"}}}), Parse("Key:\r\n value\r\n\r\n"));
 }

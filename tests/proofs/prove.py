@@ -98,7 +98,7 @@ def half_digit_is_quotient_and_remainder():
 
 def plain_text_is_eight_bytes_above_the_line_ends():
     eight = word("eight", 64)
-    function = load("apk/manifest_parser.cpp", "IsPlainText")
+    function = load("apk/manifest_mf.cpp", "IsPlainText")
     expected = z3.And(*(z3.UGT(z3.Extract(8 * i + 7, 8 * i, eight.term), ord("\r"))
                         for i in range(8)))
     always([], function(Pointer(eight)).condition == expected)
