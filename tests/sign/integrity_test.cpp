@@ -144,6 +144,7 @@ TEST(VeltTaskReadIntegrity, ANegativeProcessIdFailsWithoutOpeningAnything) {
   EXPECT_EQ(VeltTaskReadIntegrity(-1, 0, &value), 0x10000U);
   EXPECT_EQ(value, 5U);
   EXPECT_EQ(phone.events, Events());
+  EXPECT_EQ(phone.other_fopens, 0);
 }
 
 TEST(VeltTaskReadIntegrity, ANullValueFailsWithoutOpeningAnything) {

@@ -203,6 +203,20 @@ TEST(VeltSignJni, TheDescriptorOfALibraryIsClosed) {
   EXPECT_EQ(fcntl(file.fd() + 1, F_GETFD), -1);
 }
 
+// As in a process that was started without standard input.
+TEST(VeltSignJni, ALibraryMayHaveDescriptor0) {
+  const ZipItem library = Library("lib/arm64-v8a/libfoo.so");
+  PackageOnPhone file(MakePackage(WithLibraries({library})));
+  file.Install("lib/arm64/libfoo.so", library);
+  const int standard_input = dup(0);
+  close(0);
+  EXPECT_EQ(file.SignJni(), 0U);
+  EXPECT_EQ(fcntl(0, F_GETFD), -1);
+  dup2(standard_input, 0);
+  close(standard_input);
+  EXPECT_EQ(file.phone.events, Events({kSelf, SignEvent(0)}));
+}
+
 TEST(VeltSignJni, ALibraryIsOpenedWithoutWaiting) {
   const ZipItem library = Library("lib/arm64-v8a/libfoo.so");
   PackageOnPhone file(MakePackage(WithLibraries({library})));

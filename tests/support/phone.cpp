@@ -79,6 +79,7 @@ int __wrap_open(const char* path, int flags, ...) {
 int __wrap___open_2(const char* path, int flags) { return __wrap_open(path, flags); }
 
 FILE* __wrap_fopen(const char* path, const char* mode) {
+  if (phone != nullptr && !IsIntegrityFile(path)) ++phone->other_fopens;
   if (phone == nullptr || !IsIntegrityFile(path)) return __real_fopen(path, mode);
   if (phone->before_integrity) phone->before_integrity();
   phone->events.push_back(std::string("integrity ") + path);

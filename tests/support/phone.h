@@ -45,6 +45,8 @@ struct Phone {
   // What the code under test did, in the order in which it did it: "integrity PATH", "sleep
   // MICROSECONDS", "sign FD PAYLOAD-HEX", "verify FD", "register FD NAME DATA-HEX".
   std::vector<std::string> events;
+  // How many files other than an integrity file fopen was asked for.
+  int other_fopens = 0;
   // The attributes that were asked for: "FD NAME VALUE-IS-NULL SIZE".
   std::vector<std::string> attributes;
 };
