@@ -8,6 +8,7 @@
 #include <cstdio>
 
 #include "support/compiled_manifest.h"
+#include "support/files.h"
 #include "support/jar.h"
 #include "support/log_capture.h"
 #include "support/open_package.h"
@@ -148,22 +149,6 @@ TEST(ApkInit, APathThatCannotBeOpenedIsReported) {
   EXPECT_EQ(apk.GetFd(), -1);
   EXPECT_EQ(StateOf(apk), (State{false, false, false, false}));
 }
-
-// Gives the process's standard stream of this number away while it lives.
-class FreeDescriptor {
- public:
-  explicit FreeDescriptor(int fd) : fd_(fd), kept_(dup(fd)) { close(fd); }
-  ~FreeDescriptor() {
-    dup2(kept_, fd_);
-    close(kept_);
-  }
-  FreeDescriptor(const FreeDescriptor&) = delete;
-  FreeDescriptor& operator=(const FreeDescriptor&) = delete;
-
- private:
-  const int fd_;
-  const int kept_;
-};
 
 TEST(ApkInit, DescriptorZeroFromItsOwnOpenCountsAsAFailure) {
   DiskFile file(MakePackage(WithoutDex()).Build());

@@ -208,12 +208,11 @@ TEST(VeltSignJni, ALibraryMayHaveDescriptor0) {
   const ZipItem library = Library("lib/arm64-v8a/libfoo.so");
   PackageOnPhone file(MakePackage(WithLibraries({library})));
   file.Install("lib/arm64/libfoo.so", library);
-  const int standard_input = dup(0);
-  close(0);
-  EXPECT_EQ(file.SignJni(), 0U);
-  EXPECT_EQ(fcntl(0, F_GETFD), -1);
-  dup2(standard_input, 0);
-  close(standard_input);
+  {
+    const FreeDescriptor zero(0);
+    EXPECT_EQ(file.SignJni(), 0U);
+    EXPECT_EQ(fcntl(0, F_GETFD), -1);
+  }
   EXPECT_EQ(file.phone.events, Events({kSelf, SignEvent(0)}));
 }
 

@@ -82,3 +82,10 @@ MemoryFile::MemoryFile(const Bytes& content, const std::string& name)
 }
 
 MemoryFile::~MemoryFile() { close(fd_); }
+
+FreeDescriptor::FreeDescriptor(int fd) : fd_(fd), kept_(dup(fd)) { close(fd); }
+
+FreeDescriptor::~FreeDescriptor() {
+  dup2(kept_, fd_);
+  close(kept_);
+}

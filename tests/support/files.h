@@ -60,3 +60,16 @@ class MemoryFile {
   int fd_;
   std::string path_;
 };
+
+// While it lives, no file is open under the number `fd`.
+class FreeDescriptor {
+ public:
+  explicit FreeDescriptor(int fd);
+  ~FreeDescriptor();
+  FreeDescriptor(const FreeDescriptor&) = delete;
+  FreeDescriptor& operator=(const FreeDescriptor&) = delete;
+
+ private:
+  const int fd_;
+  const int kept_;
+};

@@ -8,8 +8,7 @@
 namespace {
 
 size_t AllOfTheMachine() {
-  return static_cast<size_t>(sysconf(_SC_PHYS_PAGES)) *
-         static_cast<size_t>(sysconf(_SC_PAGESIZE));
+  return static_cast<size_t>(sysconf(_SC_PHYS_PAGES)) * static_cast<size_t>(sysconf(_SC_PAGESIZE));
 }
 
 TEST(FitsInMemory, NothingAndAPageDo) {
