@@ -9,9 +9,9 @@
 #include "support/compiled_manifest.h"
 #include "support/files.h"
 #include "support/jar.h"
-#include "support/newer_signers.h"
 #include "support/package.h"
 #include "support/signature_block.h"
+#include "support/signing_block.h"
 
 namespace {
 

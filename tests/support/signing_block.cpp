@@ -8,10 +8,7 @@
 
 namespace {
 
-constexpr uint32_t kSchemeV2 = 0x7109871a;
 constexpr uint32_t kRsaPkcs1Sha256 = 0x0103;
-constexpr size_t kEndRecordSize = 22;            // of the end of the central directory
-constexpr size_t kDirectoryOffsetInRecord = 16;  // where that tells the directory's offset
 
 Bytes Number32(uint32_t value) {
   Bytes bytes;
@@ -30,12 +27,37 @@ Bytes Prefixed(const std::vector<Bytes>& pieces) {
   return Concat({Number32(static_cast<uint32_t>(whole.size())), whole});
 }
 
+// An archive without a comment, taken apart.
+struct ArchiveParts {
+  Bytes entries, directory, end_record;
+};
+
+constexpr size_t kEndRecordSize = 22;            // of the end of the central directory
+constexpr size_t kDirectoryOffsetInRecord = 16;  // where that tells the directory's offset
+constexpr size_t kCommentInRecord = 20;          // and the length of the comment
+
+ArchiveParts TakeApart(const Bytes& archive) {
+  if (archive.size() < kEndRecordSize) abort();
+  const auto end = archive.end() - static_cast<ptrdiff_t>(kEndRecordSize);
+  ArchiveParts parts;
+  parts.end_record.assign(end, archive.end());
+  uint32_t offset = 0;
+  for (size_t i = 4; i-- > 0;) {
+    offset = offset << 8 | parts.end_record[kDirectoryOffsetInRecord + i];
+  }
+  if (offset > archive.size() - kEndRecordSize) abort();
+  const auto directory = archive.begin() + static_cast<ptrdiff_t>(offset);
+  parts.entries.assign(archive.begin(), directory);
+  parts.directory.assign(directory, end);
+  return parts;
+}
+
 // The digest of the digests of each megabyte of the three parts.
-Bytes DigestOfChunks(const std::vector<Bytes>& parts) {
+Bytes DigestOfChunks(const ArchiveParts& parts) {
   constexpr size_t kChunk = 1 << 20;
   Bytes digests;
   uint32_t count = 0;
-  for (const Bytes& part : parts) {
+  for (const Bytes& part : {parts.entries, parts.directory, parts.end_record}) {
     for (size_t start = 0; start < part.size(); start += kChunk, ++count) {
       const size_t size = std::min(kChunk, part.size() - start);
       const auto first = part.begin() + static_cast<ptrdiff_t>(start);
@@ -48,7 +70,7 @@ Bytes DigestOfChunks(const std::vector<Bytes>& parts) {
   return DigestOf(Digest::kSha256, Concat({{0x5a}, Number32(count), digests}));
 }
 
-Bytes Signer(const Bytes& digest, const std::string& key) {
+Bytes SignerOf(const Bytes& digest, const std::string& key) {
   Certificate certificate;
   certificate.key = key;
   const Bytes signed_data =
@@ -60,29 +82,38 @@ Bytes Signer(const Bytes& digest, const std::string& key) {
                  Prefixed({PublicKeyInfo(key)})});
 }
 
-Bytes Block(const Bytes& signer) {
-  const Bytes value = Prefixed({Prefixed({signer})});
-  const Bytes pair = Concat({Number64(value.size() + 4), Number32(kSchemeV2), value});
-  const Bytes magic = ToBytes("APK Sig Block 42");
-  const Bytes size = Number64(pair.size() + 8 + magic.size());
-  return Concat({size, pair, size, magic});
-}
-
 }  // namespace
 
-Bytes AddSigningBlock(const Bytes& archive, const std::string& key) {
-  if (archive.size() < kEndRecordSize) abort();
-  const auto end = archive.end() - static_cast<ptrdiff_t>(kEndRecordSize);
-  Bytes end_record(end, archive.end());
-  uint32_t offset = 0;
-  for (size_t i = 4; i > 0; --i)
-    offset = offset << 8 | end_record[kDirectoryOffsetInRecord + i - 1];
-  if (offset > archive.size() - kEndRecordSize) abort();
-  const auto directory = archive.begin() + static_cast<ptrdiff_t>(offset);
-  const Bytes entries(archive.begin(), directory), directory_bytes(directory, end);
+Bytes SignerBytes(const Bytes& certificate) {
+  const Bytes signed_data = Concat({Prefixed({}), Prefixed({Prefixed({certificate})})});
+  return Concat({Prefixed({signed_data}), Prefixed({}), Prefixed({})});
+}
 
-  const Bytes block = Block(Signer(DigestOfChunks({entries, directory_bytes, end_record}), key));
-  const Bytes moved = Number32(offset + static_cast<uint32_t>(block.size()));
-  std::copy(moved.begin(), moved.end(), end_record.begin() + kDirectoryOffsetInRecord);
-  return Concat({entries, block, directory_bytes, end_record});
+Bytes Signers(const std::vector<Bytes>& signers) {
+  std::vector<Bytes> elements;
+  for (const Bytes& signer : signers) elements.push_back(Prefixed({signer}));
+  return Prefixed(elements);
+}
+
+Bytes SigningBlockBytes(const std::vector<std::pair<uint32_t, Bytes>>& pairs) {
+  Bytes body;
+  for (const auto& [id, value] : pairs) {
+    body = Concat({body, Number64(value.size() + 4), Number32(id), value});
+  }
+  const Bytes magic = ToBytes("APK Sig Block 42");
+  const Bytes size = Number64(body.size() + 8 + magic.size());
+  return Concat({size, body, size, magic});
+}
+
+Bytes ArchiveWithBlock(const Bytes& archive, const Bytes& block, const std::string& comment) {
+  ArchiveParts parts = TakeApart(archive);
+  const Bytes moved = Number32(static_cast<uint32_t>(parts.entries.size() + block.size()));
+  std::copy(moved.begin(), moved.end(), parts.end_record.begin() + kDirectoryOffsetInRecord);
+  parts.end_record[kCommentInRecord] = static_cast<uint8_t>(comment.size());
+  return Concat({parts.entries, block, parts.directory, parts.end_record, ToBytes(comment)});
+}
+
+Bytes AddSigningBlock(const Bytes& archive, const std::string& key) {
+  const Bytes signer = SignerOf(DigestOfChunks(TakeApart(archive)), key);
+  return ArchiveWithBlock(archive, SigningBlockBytes({{kSchemeV2, Signers({signer})}}));
 }

@@ -1,11 +1,30 @@
-// Signing archives as packages have been signed since Android 7: a block between the entries and
-// the central directory that vouches for all bytes of the file but its own (APK Signature Scheme
-// v2). What lies in META-INF is to it an entry like others.
+// Writing the block of the schemes after JAR signing (APK Signature Scheme v2, v3, v3.1), which
+// lies between an archive's entries and its central directory, layer by layer. What lies in
+// META-INF is to it an entry like others. Numbers are little-endian; every list and element has its
+// length as 32 bits before it.
 #pragma once
 
+#include <cstdint>
 #include <string>
+#include <utility>
+#include <vector>
 
 #include "support/bytes.h"
 
-// The archive, which has no such block and no comment, with one by the RSA test key `key` in it.
+inline constexpr uint32_t kSchemeV2 = 0x7109871a;
+inline constexpr uint32_t kSchemeV3 = 0xf05368c0;
+inline constexpr uint32_t kSchemeV31 = 0x1b93ad61;
+
+// A signer with this certificate: signed data (no digests, one certificate), no signatures, no key.
+Bytes SignerBytes(const Bytes& certificate);
+// The value of a scheme.
+Bytes Signers(const std::vector<Bytes>& signers);
+// The block of these pairs of scheme and value: size, pairs, size again, magic.
+Bytes SigningBlockBytes(const std::vector<std::pair<uint32_t, Bytes>>& pairs);
+// The archive, which has no comment, with `block` before its central directory and then `comment`
+// at its end, of at most 255 characters.
+Bytes ArchiveWithBlock(const Bytes& archive, const Bytes& block, const std::string& comment = "");
+
+// The archive, which has no such block and no comment, signed with scheme v2 by the RSA test key
+// `key`: with a block that vouches for all bytes of the file but its own.
 Bytes AddSigningBlock(const Bytes& archive, const std::string& key);

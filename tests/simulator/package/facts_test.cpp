@@ -8,8 +8,8 @@
 #include <cerrno>
 
 #include "support/files.h"
-#include "support/newer_signers.h"
 #include "support/package.h"
+#include "support/signing_block.h"
 
 namespace {
 

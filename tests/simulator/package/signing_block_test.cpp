@@ -4,7 +4,7 @@
 
 #include "simulator/package/archive_end.h"
 #include "support/files.h"
-#include "support/newer_signers.h"
+#include "support/signing_block.h"
 #include "support/zip.h"
 
 namespace {
