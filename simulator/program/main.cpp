@@ -2,26 +2,30 @@
 #include <unistd.h>
 
 #include <algorithm>
-#include <cerrno>
-#include <cstring>
 #include <iostream>
 
 #include "simulator/phone/journal.h"
-#include "simulator/program/journal_file.h"
 #include "simulator/program/options.h"
+#include "simulator/program/output_file.h"
 #include "simulator/program/process.h"
 #include "simulator/program/queue.h"
 #include "simulator/program/simulator.h"
 
 namespace {
 
+constexpr OutputKind kJournal = {"--journal", "journal", "{\"event\":\"journal\""};
+
 // Tells of each file in the ways that were asked for.
 class Presenter {
  public:
   explicit Presenter(const Options& options)
-      : options_(options), has_progress_(isatty(STDERR_FILENO) != 0) {}
+      : options_(options),
+        has_progress_(isatty(STDERR_FILENO) != 0),
+        journal_(kJournal, options.journal) {}
 
-  bool OpenJournal();
+  // Why nothing may begin, for the sake of the user's files.
+  std::optional<std::string> Objection() const;
+  bool Begin();
   void Show(const Outcome& outcome);
   void ShowProgress(const std::string& file, int seconds);
   void ShowSummary();
@@ -30,12 +34,13 @@ class Presenter {
 
  private:
   void Keep(const std::string& journal);
+  void FailToWrite(const OutputFile& file);
   void EraseProgress();
 
   const Options& options_;
   const bool has_progress_;
   const Look look_ = LookOfStandardOutput();
-  JournalFile journal_;
+  OutputFile journal_;
   std::vector<Verdict> verdicts_;
   bool is_progress_shown_ = false;
   int status_ = kAllSigned;
@@ -54,20 +59,12 @@ int main(int argc, char** argv) {
   const bool has_standard_input = KeepStandardStreams();
   Options options;
   if (const auto status = ParseOptions(argc, argv, &options)) return *status;
-  std::vector<std::string> inputs = options.files;
-  inputs.insert(inputs.end(), options.trust.begin(), options.trust.end());
-  inputs.push_back(options.tool);
-  if (const auto objection = JournalFile::Objection(options.journal, inputs)) {
-    return Complain(kUsageError, *objection);
-  }
   Simulator simulator(options, has_standard_input);
   Presenter presenter(options);
+  if (const auto objection = presenter.Objection()) return Complain(kUsageError, *objection);
   std::string error;
   if (!simulator.Prepare(&error)) return Complain(kCannotSimulate, error);
-  if (!presenter.OpenJournal()) {
-    return Complain(kCannotSimulate,
-                    "cannot write the journal " + options.journal + ": " + strerrordesc_np(errno));
-  }
+  if (!presenter.Begin()) return kCannotSimulate;
   CatchInterruptions();
   RunInOrder(
       options.files, options.jobs, [&](const std::string& file) { return simulator.Run(file); },
@@ -80,9 +77,19 @@ int main(int argc, char** argv) {
 
 namespace {
 
-bool Presenter::OpenJournal() {
-  if (!options_.journal.empty() && !journal_.Open(options_.journal)) return false;
-  Keep(Event("journal").Number("version", kJournalVersion).Line());
+std::optional<std::string> Presenter::Objection() const {
+  std::vector<std::string> inputs = options_.files;
+  inputs.insert(inputs.end(), options_.trust.begin(), options_.trust.end());
+  inputs.push_back(options_.tool);
+  return journal_.Objection(inputs);
+}
+
+bool Presenter::Begin() {
+  if (!journal_.Open()) {
+    FailToWrite(journal_);
+  } else {
+    Keep(Event("journal").Number("version", kJournalVersion).Line());
+  }
   return status_ == kAllSigned;
 }
 
@@ -131,10 +138,11 @@ int Presenter::Finish() const {
 // The journal goes to its file, and to standard output when that is asked for.
 void Presenter::Keep(const std::string& journal) {
   if (options_.json) std::cout << journal;
-  if (options_.journal.empty() || journal_.Append(journal)) return;
-  status_ =
-      std::max(status_, Complain(kCannotSimulate, "cannot write the journal " + options_.journal +
-                                                      ": " + strerrordesc_np(errno)));
+  if (!journal_.Append(journal)) FailToWrite(journal_);
+}
+
+void Presenter::FailToWrite(const OutputFile& file) {
+  status_ = std::max(status_, Complain(kCannotSimulate, file.ErrorText()));
 }
 
 }  // namespace
