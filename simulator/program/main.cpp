@@ -9,6 +9,7 @@
 #include "simulator/program/output_file.h"
 #include "simulator/program/process.h"
 #include "simulator/program/queue.h"
+#include "simulator/program/report_words.h"
 #include "simulator/program/simulator.h"
 
 namespace {

@@ -3,8 +3,6 @@
 #pragma once
 
 #include <ostream>
-#include <string>
-#include <vector>
 
 #include "simulator/program/report.h"
 #include "simulator/program/terminal.h"
@@ -12,6 +10,3 @@
 enum class Detail { kVerdict, kUsual, kAll };
 
 void PrintReport(const Report& report, Detail detail, const Look& look, std::ostream& out);
-
-// Such as "3 files: 1 signed, 2 refused".
-std::string Summary(const std::vector<Verdict>& verdicts);

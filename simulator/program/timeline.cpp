@@ -10,13 +10,7 @@ namespace {
 
 using nlohmann::json;
 
-// How one event reads.
-struct Line {
-  std::string what;
-  std::string text;
-  std::string detail;  // for a line of its own below; mostly empty
-  bool is_failure = false;
-};
+using Line = TimelineLine;
 
 bool IsShown(const json& event);
 Line Describe(const json& event, const std::string& directory);
@@ -31,17 +25,21 @@ void PrintLine(int number, const Line& line, const Look& look, std::ostream& out
 
 }  // namespace
 
-void PrintTimeline(const Events& events, const std::string& path, const Look& look,
-                   std::ostream& out) {
+std::vector<TimelineLine> MakeTimeline(const Events& events, const std::string& path) {
   const std::string directory = path.substr(0, path.rfind('/') + 1);
-  int number = 0;
+  std::vector<TimelineLine> lines;
   for (auto event = events.begin(), next = event; event != events.end(); event = next) {
     next = std::find_if(event, events.end(), [event](const json& e) { return e != *event; });
     if (!IsShown(*event)) continue;
-    Line line = Describe(*event, directory);
-    if (next - event > 1) line.text += " (" + std::to_string(next - event) + " times)";
-    PrintLine(++number, line, look, out);
+    lines.push_back(Describe(*event, directory));
+    if (next - event > 1) lines.back().text += " (" + std::to_string(next - event) + " times)";
   }
+  return lines;
+}
+
+void PrintTimeline(const std::vector<TimelineLine>& lines, const Look& look, std::ostream& out) {
+  int number = 0;
+  for (const TimelineLine& line : lines) PrintLine(++number, line, look, out);
 }
 
 namespace {

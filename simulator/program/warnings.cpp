@@ -3,13 +3,13 @@
 #include <algorithm>
 
 #include "simulator/program/package_reason.h"
+#include "simulator/program/report_words.h"
 
 namespace {
 
 void WarnOfOtherKeys(const PackageFacts& facts, std::vector<Reason>* warnings);
 void WarnOfStrippedSchemes(const PackageFacts& facts, std::vector<Reason>* warnings);
 void WarnOfUnlistedEntries(const PackageFacts& facts, std::vector<Reason>* warnings);
-std::string Counted(size_t count, const char* one, const char* many);
 
 }  // namespace
 
@@ -87,10 +87,6 @@ void WarnOfUnlistedEntries(const PackageFacts& facts, std::vector<Reason>* warni
   if (count == 0) return;
   warnings->push_back({&cause::kUnlistedEntries, Counted(count, "entry", "entries") + " (" +
                                                      Counted(bytes, "byte", "bytes") + ")"});
-}
-
-std::string Counted(size_t count, const char* one, const char* many) {
-  return std::to_string(count) + " " + (count == 1 ? one : many);
 }
 
 }  // namespace

@@ -183,8 +183,3 @@ TEST(ReportText, NothingOfAHostileFileReachesATerminal) {
     EXPECT_TRUE(c == '\n' || (c >= 0x20 && c < 0x7f));
   }
 }
-
-TEST(Summary, CountsEachVerdict) {
-  EXPECT_EQ(Summary({Verdict::kSigned, Verdict::kRefused, Verdict::kSigned, Verdict::kNotLookedAt}),
-            "4 files: 2 signed, 1 refused, 1 not looked at");
-}

@@ -12,7 +12,7 @@ namespace {
 std::string Printed(const std::string& journal, bool colours = false) {
   std::ostringstream out;
   const Look look = {colours, true};
-  PrintTimeline(ParseEvents(journal), "/data/app/base.apk", look, out);
+  PrintTimeline(MakeTimeline(ParseEvents(journal), "/data/app/base.apk"), look, out);
   return out.str();
 }
 
