@@ -7,6 +7,7 @@
 #include "simulator/phone/journal.h"
 #include "simulator/program/options.h"
 #include "simulator/program/output_file.h"
+#include "simulator/program/page.h"
 #include "simulator/program/process.h"
 #include "simulator/program/queue.h"
 #include "simulator/program/report_words.h"
@@ -15,6 +16,7 @@
 namespace {
 
 constexpr OutputKind kJournal = {"--journal", "journal", "{\"event\":\"journal\""};
+constexpr OutputKind kPage = {"--html", "page", kPageStart};
 
 // Tells of each file in the ways that were asked for.
 class Presenter {
@@ -22,7 +24,8 @@ class Presenter {
   explicit Presenter(const Options& options)
       : options_(options),
         has_progress_(isatty(STDERR_FILENO) != 0),
-        journal_(kJournal, options.journal) {}
+        journal_(kJournal, options.journal),
+        page_file_(kPage, options.html) {}
 
   // Why nothing may begin, for the sake of the user's files.
   std::optional<std::string> Objection() const;
@@ -30,6 +33,7 @@ class Presenter {
   void Show(const Outcome& outcome);
   void ShowProgress(const std::string& file, int seconds);
   void ShowSummary();
+  void WritePage();
   // The highest status of all; kCannotSimulate at least when something could not be written.
   int Finish() const;
 
@@ -42,6 +46,8 @@ class Presenter {
   const bool has_progress_;
   const Look look_ = LookOfStandardOutput();
   OutputFile journal_;
+  OutputFile page_file_;
+  Page page_;
   std::vector<Verdict> verdicts_;
   bool is_progress_shown_ = false;
   int status_ = kAllSigned;
@@ -72,6 +78,7 @@ int main(int argc, char** argv) {
       [&](const Outcome& outcome) { presenter.Show(outcome); },
       [&](const std::string& file, int seconds) { presenter.ShowProgress(file, seconds); });
   presenter.ShowSummary();
+  presenter.WritePage();
   EndIfInterrupted();
   return presenter.Finish();
 }
@@ -82,7 +89,9 @@ std::optional<std::string> Presenter::Objection() const {
   std::vector<std::string> inputs = options_.files;
   inputs.insert(inputs.end(), options_.trust.begin(), options_.trust.end());
   inputs.push_back(options_.tool);
-  return journal_.Objection(inputs);
+  if (journal_.IsSameAs(page_file_)) return "--journal and --html name the same file";
+  if (const auto objection = journal_.Objection(inputs)) return objection;
+  return page_file_.Objection(inputs);
 }
 
 bool Presenter::Begin() {
@@ -91,6 +100,7 @@ bool Presenter::Begin() {
   } else {
     Keep(Event("journal").Number("version", kJournalVersion).Line());
   }
+  if (!page_file_.Open()) FailToWrite(page_file_);
   return status_ == kAllSigned;
 }
 
@@ -103,6 +113,7 @@ void Presenter::Show(const Outcome& outcome) {
     if (has_gap) std::cout << '\n';
     PrintReport(report, options_.detail, look_, std::cout);
   }
+  if (page_file_.IsWanted()) page_.Add(report);
   std::cout.flush();
   verdicts_.push_back(report.verdict);
   if (report.verdict == Verdict::kNotSimulated) {
@@ -128,6 +139,10 @@ void Presenter::ShowSummary() {
   EraseProgress();
   if (options_.json || options_.detail == Detail::kVerdict || options_.files.size() < 2) return;
   std::cout << '\n' << Summary(verdicts_) << '\n';
+}
+
+void Presenter::WritePage() {
+  if (page_file_.IsWanted() && !page_file_.Append(page_.Html())) FailToWrite(page_file_);
 }
 
 int Presenter::Finish() const {

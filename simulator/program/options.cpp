@@ -176,6 +176,9 @@ void AddOutput(CLI::App* app, Options* options) {
   app->add_option("--journal", options->journal, "Keep the journal in FILE")
       ->type_name("FILE")
       ->group(kTheRun);
+  app->add_option("--html", options->html, "Write all of it to FILE, a page for a browser")
+      ->type_name("FILE")
+      ->group(kTheRun);
 }
 
 void AddRun(CLI::App* app, Options* options, std::string* runner) {

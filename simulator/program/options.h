@@ -24,6 +24,7 @@ struct Options {
   bool is_strict = false;           // a library that is not there counts as refused
   Detail detail = Detail::kUsual;   // of the text
   std::string journal;              // where the journal is kept; empty: it is not
+  std::string html;                 // where the page is written; empty: it is not
   bool json = false;                // the journal on standard output in place of the text
   unsigned jobs = 1;                // how many files at a time
   std::string tool;                 // the program that is run

@@ -29,7 +29,6 @@ class Printer {
   void PrintItem(const Item& item, size_t width);
   void PrintWrapped(const std::string& text, size_t indent);
   void PrintCertificate(const CertificateFacts& certificate);
-  const char* Shown(Mark mark) const;
   std::string Shown(std::string_view bytes) const { return Printable(bytes, look_); }
 
   const Report& report_;
@@ -86,8 +85,8 @@ void Printer::PrintItems() {
 void Printer::PrintItem(const Item& item, size_t width) {
   const std::string name = Shown(NameOf(item));
   const std::string gap(width + 2 - std::min(width, Columns(name)), ' ');
-  const std::string text = "  " + std::string(Shown(MarkOf(item.state))) + " " + name + gap +
-                           Shown(OutcomeOf(item, report_.verdict));
+  const std::string text = "  " + std::string(SymbolOf(MarkOf(item.state), look_.has_utf8)) + " " +
+                           name + gap + Shown(OutcomeOf(item, report_.verdict));
   out_ << Coloured(text, item.state == ItemState::kRefused ? Colour::kRed : Colour::kPlain, look_)
        << '\n';
 }
@@ -120,7 +119,7 @@ void Printer::PrintSigner() {
   if (!report_.signer) return;
   out_ << "  signer\n";
   PrintCertificate(*report_.signer);
-  out_ << "    schemes: " << Joined(report_.schemes) << '\n';
+  out_ << "    schemes: " << Shown(Joined(report_.schemes)) << '\n';
   PrintProtection();
 }
 
@@ -132,7 +131,7 @@ void Printer::PrintCertificate(const CertificateFacts& certificate) {
 
 void Printer::PrintNewerSigners() {
   for (const NewerSignerFacts& signer : report_.newer) {
-    out_ << "  signer of " << signer.scheme << '\n';
+    out_ << "  signer of " << Shown(signer.scheme) << '\n';
     PrintCertificate(signer.certificate);
   }
 }
@@ -152,21 +151,9 @@ void Printer::PrintUnlisted() {
 
 void Printer::PrintChain() {
   for (const Link& link : report_.chain) {
-    out_ << "    " << Shown(MarkOf(link.state)) << " " << link.name << ": " << Shown(TextOf(link))
-         << '\n';
+    out_ << "    " << SymbolOf(MarkOf(link.state), look_.has_utf8) << " " << link.name << ": "
+         << Shown(TextOf(link)) << '\n';
   }
-}
-
-const char* Printer::Shown(Mark mark) const {
-  switch (mark) {
-    case Mark::kGood:
-      return look_.has_utf8 ? "✓" : "+";
-    case Mark::kBad:
-      return look_.has_utf8 ? "✗" : "x";
-    case Mark::kNeither:
-      return look_.has_utf8 ? "–" : "-";
-  }
-  return "";
 }
 
 Colour ColourOf(Mood mood) {

@@ -32,16 +32,16 @@ VerdictWords WordsOf(Verdict verdict) {
 }
 
 std::string Summary(const std::vector<Verdict>& verdicts) {
-  std::string text = Counted(verdicts.size(), "file", "files") + ": ";
-  bool is_first = true;
+  std::string text = Counted(verdicts.size(), "file", "files");
+  const char* separator = ": ";
   for (const Verdict verdict :
        {Verdict::kSigned, Verdict::kTrustedJar, Verdict::kPartlySigned, Verdict::kRefused,
         Verdict::kNotTrustedJar, Verdict::kNotLookedAt, Verdict::kNotSimulated}) {
     const auto count = static_cast<size_t>(std::count(verdicts.begin(), verdicts.end(), verdict));
     if (count == 0) continue;
     const VerdictWords words = WordsOf(verdict);
-    text += (is_first ? "" : ", ") + Counted(count, words.one, words.many);
-    is_first = false;
+    text += separator + Counted(count, words.one, words.many);
+    separator = ", ";
   }
   return text;
 }
@@ -69,6 +69,18 @@ Mark MarkOf(LinkState state) {
       break;
   }
   return Mark::kNeither;
+}
+
+const char* SymbolOf(Mark mark, bool has_utf8) {
+  switch (mark) {
+    case Mark::kGood:
+      return has_utf8 ? "✓" : "+";
+    case Mark::kBad:
+      return has_utf8 ? "✗" : "x";
+    case Mark::kNeither:
+      break;
+  }
+  return has_utf8 ? "–" : "-";
 }
 
 std::string NameOf(const Item& item) { return item.kind == ItemKind::kKey ? "key" : item.name; }

@@ -23,11 +23,14 @@ VerdictWords WordsOf(Verdict verdict);
 // Such as "3 files: 1 signed, 2 refused".
 std::string Summary(const std::vector<Verdict>& verdicts);
 
-// What stands before a line: "✓", "✗" and "–", where these can be shown.
+// What stands before a line.
 enum class Mark { kGood, kBad, kNeither };
 
 Mark MarkOf(ItemState state);
 Mark MarkOf(LinkState state);
+
+// "✓", "✗" and "–", or "+", "x" and "-" where these cannot be shown.
+const char* SymbolOf(Mark mark, bool has_utf8);
 
 std::string NameOf(const Item& item);
 

@@ -18,8 +18,10 @@ bool IsShown(std::string_view character, const Look& look) {
   if (character.size() == 1) return first >= 0x20 && first != 0x7f;
   if (!look.has_utf8) return false;
   const uint8_t second = static_cast<uint8_t>(character[1]);
-  // U+0080 to U+009F are controls.
-  if (character.size() == 2) return first != 0xc2 || second >= 0xa0;
+  // U+0080 to U+009F are controls, and U+061C turns what stands around it.
+  if (character.size() == 2) {
+    return (first != 0xc2 || second >= 0xa0) && (first != 0xd8 || second != 0x9c);
+  }
   if (character.size() > 3) return true;
   // U+200B to U+200F, U+2028 to U+202E, U+2060 to U+206F and U+FEFF have no width or turn what
   // stands around them.

@@ -41,6 +41,7 @@ TEST(Options, DefaultIsAHealthyPhone) {
   EXPECT_EQ(options.trust, Lines());
   EXPECT_EQ(options.state, "");
   EXPECT_EQ(options.journal, "");
+  EXPECT_EQ(options.html, "");
   EXPECT_FALSE(options.json);
   EXPECT_EQ(options.tool, ProgramDirectory() + "/apktoolkit");
   EXPECT_EQ(options.runner, Lines());
@@ -73,10 +74,11 @@ TEST(Options, TrustTakesOneFileAtATime) {
 
 TEST(Options, TheRestIsTakenAsItIs) {
   const Options options =
-      Parsed({"--state", "s", "--journal", "j", "--json", "--tool", "t", "--timeout", "0.5",
-              "--runner", "emulator  -L /root", "--", "-a.apk"});
+      Parsed({"--state", "s", "--journal", "j", "--html", "h", "--json", "--tool", "t", "--timeout",
+              "0.5", "--runner", "emulator  -L /root", "--", "-a.apk"});
   EXPECT_EQ(options.state, "s");
   EXPECT_EQ(options.journal, "j");
+  EXPECT_EQ(options.html, "h");
   EXPECT_TRUE(options.json);
   EXPECT_EQ(options.tool, "t");
   EXPECT_EQ(options.timeout, 0.5);
@@ -153,6 +155,7 @@ TEST(Options, HelpNamesEveryOptionAndStatus) {
                            "--quiet ",
                            "--verbose ",
                            "--journal FILE",
+                           "--html FILE",
                            "--json ",
                            "--jobs N",
                            "--tool PATH",

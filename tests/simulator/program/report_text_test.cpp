@@ -5,6 +5,7 @@
 #include <sstream>
 
 #include "simulator/phone/probe_run.h"
+#include "simulator/program/hostile_report.h"
 
 namespace {
 
@@ -160,18 +161,7 @@ TEST(ReportText, NeighboursShareWhatToDo) {
 }
 
 TEST(ReportText, NothingOfAHostileFileReachesATerminal) {
-  Report report = Example();
-  const std::string hostile = "\x1b]0;x\x07\u202e\xff";
-  report.file = report.package_name = hostile;
-  report.signer = Signer();
-  report.signer->subject = report.signer->key.algorithm = hostile;
-  report.items[1].name = hostile;
-  report.items[2].reason = {&cause::kToolError, hostile};
-  report.items[4].name = hostile;
-  report.warnings = {{&cause::kOtherKey, hostile}};
-  report.protection.unlisted_names = {hostile};
-  report.newer = {{"v2", *report.signer}};
-  report.chain = {{"key", LinkState::kHolds, hostile}};
+  const Report report = HostileReport(kHostileText);
   for (const Look& look : {kUtf8, kAscii}) {
     const std::string text = Printed(report, look, Detail::kAll);
     EXPECT_EQ(text.find('\x1b'), std::string::npos);

@@ -176,6 +176,20 @@ TEST(ExitStatus, ThreeWhenTheJournalCannotBeWritten) {
             "or directory\n");
 }
 
+TEST(ExitStatus, ThreeWhenThePageCannotBeWritten) {
+  const Probe probe({"sign 3 0100ab"});
+  const ProcessResult nowhere = Simulated({"--html", "/nowhere/page", probe.path()});
+  EXPECT_EQ(nowhere.status, 3);
+  EXPECT_EQ(nowhere.output, "");
+  EXPECT_EQ(nowhere.errors,
+            "apktoolkit-sim: cannot write the page /nowhere/page: No such file or directory\n");
+  const ProcessResult full = Simulated({"--quiet", "--html", "/dev/full", probe.path()});
+  EXPECT_EQ(full.status, 3);
+  EXPECT_EQ(full.output, "SIGNED  " + probe.path() + "\n");
+  EXPECT_EQ(full.errors,
+            "apktoolkit-sim: cannot write the page /dev/full: No space left on device\n");
+}
+
 TEST(ExitStatus, ThreeWhenTheStateCannotBeKept) {
   const ProcessResult result = Simulated({"--state", "/dev/null", "/"});
   EXPECT_EQ(result.status, 3);
@@ -191,6 +205,31 @@ TEST(ExitStatus, TwoWhenTheJournalWouldReplaceAFile) {
   EXPECT_EQ(result.errors, "apktoolkit-sim: --journal " + probe.path() +
                                " is a file that is to be looked at; it is left alone\n");
   EXPECT_EQ(ContentOf(probe.path()), before);
+}
+
+TEST(ExitStatus, TwoWhenThePageWouldReplaceAFile) {
+  const Probe probe({"sign 3 0000"});
+  const std::string notes = probe.folder().Write("notes.html", ToBytes("<!DOCTYPE html>\n<p>"));
+  for (const std::string& victim : {probe.path(), notes}) {
+    const std::string before = ContentOf(victim);
+    const ProcessResult result = Simulated({"--html", victim, probe.path()});
+    EXPECT_EQ(result.status, 2);
+    EXPECT_EQ(result.output, "");
+    EXPECT_EQ(result.errors, "apktoolkit-sim: --html " + victim +
+                                 (victim == notes ? " is there and holds no page of apktoolkit-sim"
+                                                  : " is a file that is to be looked at") +
+                                 "; it is left alone\n");
+    EXPECT_EQ(ContentOf(victim), before);
+  }
+}
+
+TEST(ExitStatus, TwoWhenPageAndJournalAreOneFile) {
+  const Probe probe({"sign 3 0000"});
+  const std::string file = probe.folder() / "file";
+  const ProcessResult result = Simulated({"--html", file, "--journal", file, probe.path()});
+  EXPECT_EQ(result.status, 2);
+  EXPECT_EQ(result.errors, "apktoolkit-sim: --journal and --html name the same file\n");
+  EXPECT_EQ(access(file.c_str(), F_OK), -1);
 }
 
 TEST(ExitStatus, IsTheHighestOfAllFiles) {
@@ -314,6 +353,33 @@ TEST(Journal, FileNamesAreBytes) {
   const std::vector<Json> events = ParseJournal(result.output);
   ASSERT_EQ(events.size(), 6U);
   EXPECT_EQ(events[3]["path"], folder / "od\uf7e9\n\"d");
+}
+
+TEST(Page, IsWrittenAnewForAllFilesInTheirOrder) {
+  const Probe good({"sign 3 0000", "sleep 1"});
+  const Probe bad({"verify 3"});
+  const std::string page = good.folder() / "page.html";
+  ASSERT_EQ(Simulated({"--html", page, bad.path()}).status, 1);
+  const ProcessResult result =
+      Simulated({"--html", page, "--quiet", "--jobs", "3", good.path(), bad.path(), good.path()});
+  EXPECT_EQ(result.status, 1);
+  const std::string text = ContentOf(page);
+  EXPECT_NE(text.find("<p>3 files: 2 trusted JARs, 1 JAR not trusted</p>"), std::string::npos);
+  const size_t first = text.find("<h2 id=\"name-1\"><bdi>" + good.path() + "<");
+  const size_t second = text.find("<h2 id=\"name-2\"><bdi>" + bad.path() + "<");
+  const size_t third = text.find("<h2 id=\"name-3\"><bdi>" + good.path() + "<");
+  EXPECT_TRUE(first < second && second < third && third != std::string::npos) << text;
+}
+
+TEST(Page, OfAnInterruptedRunHasWhatWasDone) {
+  const Probe good({"sign 3 0000"});
+  const Probe slow({"sign 3 0000", "sleep 60"});
+  const std::string page = good.folder() / "page.html";
+  const ProcessResult result = InShell("\"$@\" & sleep 1; kill -TERM $!; wait $!",
+                                       {"--html", page, good.path(), slow.path()});
+  EXPECT_EQ(result.status, 128 + 15);
+  EXPECT_NE(ContentOf(page).find("<bdi>" + good.path() + "</bdi>"), std::string::npos);
+  EXPECT_NE(ContentOf(page).find("</html>\n"), std::string::npos);
 }
 
 TEST(Simulation, FollowsLinksToTheFile) {

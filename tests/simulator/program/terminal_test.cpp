@@ -26,6 +26,7 @@ TEST(Printable, WhatTurnsOrHidesTextIsShownAsBytes) {
   EXPECT_EQ(Printable("a\u202eb", kUtf8), "a\\xe2\\x80\\xaeb");
   EXPECT_EQ(Printable("\u200b\u2028\u2066\ufeff", kUtf8),
             "\\xe2\\x80\\x8b\\xe2\\x80\\xa8\\xe2\\x81\\xa6\\xef\\xbb\\xbf");
+  EXPECT_EQ(Printable("\u061b\u061c", kUtf8), "\u061b\\xd8\\x9c");
   EXPECT_EQ(Printable("\u2013\u2027\u2030\u2070\ufefe", kUtf8), "\u2013\u2027\u2030\u2070\ufefe");
 }
 

@@ -1,0 +1,4 @@
+// The page's template (page.mustache), which the build makes a part of the program.
+#pragma once
+
+extern const char kPageTemplate[];
