@@ -38,7 +38,7 @@ _apktoolkit_sim() {
     *)
       if [[ $word == -* ]]; then
         mapfile -t COMPREPLY < <(
-          compgen -W "--help --install --integrity --jobs --journal --json --quiet
+          compgen -W "--help --html --install --integrity --jobs --journal --json --quiet
             --runner --sign-errno --state --strict --timeout --tool --trust --verbose
             --verify-errno --version --zu-result" -- "$word"
         )
