@@ -33,7 +33,8 @@ std::optional<LibraryName> ParseName(const std::string& entry);
 bool Wants(InstalledAbi choice, const std::string& folder, bool has_arm64);
 Layout PlanLayout(const std::vector<ArchiveEntry>& libraries, InstalledAbi choice,
                   std::vector<std::string>* left_out);
-bool PutPackage(const std::string& file, const std::string& copy);
+bool PutPackage(const std::string& file, int source, const std::string& copy,
+                const Deadline& deadline);
 bool Extract(const Archive& archive, const std::string& entry, const std::string& path,
              const Deadline& deadline);
 bool WriteAll(int fd, std::string_view bytes);
@@ -80,7 +81,7 @@ std::optional<std::string> Installation::LayOut(const std::string& file, Install
   if (mkdtemp(folder.data()) == nullptr) return folder + ": " + strerrordesc_np(errno);
   folder_ = fs::canonical(folder, error).string();
   const std::string copy = folder_ + "/" + FileName(file);
-  if (!PutPackage(file, copy)) return copy + ": " + strerrordesc_np(errno);
+  if (!PutPackage(file, source.get(), copy, deadline)) return copy + ": " + strerrordesc_np(errno);
   for (const auto& [place, entry] : layout) {
     const std::string path = folder_ + "/" + place;
     fs::create_directories(fs::path(path).parent_path(), error);
@@ -148,13 +149,23 @@ bool Wants(InstalledAbi choice, const std::string& folder, bool has_arm64) {
 }
 
 // The package itself under another name where the file system allows it, else a copy.
-bool PutPackage(const std::string& file, const std::string& copy) {
+bool PutPackage(const std::string& file, int source, const std::string& copy,
+                const Deadline& deadline) {
+  constexpr size_t kPart = 1 << 20;
   const int way = AT_SYMLINK_FOLLOW;
   if (linkat(AT_FDCWD, file.c_str(), AT_FDCWD, copy.c_str(), way) == 0) return true;
-  std::error_code error;
-  if (fs::copy_file(file, copy, error)) return true;
-  errno = error.value();
-  return false;
+  const OpenFile target(open(copy.c_str(), O_WRONLY | O_CREAT | O_EXCL | O_CLOEXEC, 0644));
+  if (target.get() < 0) return false;
+  std::string part(kPart, '\0');
+  off_t offset = 0;
+  ssize_t size;
+  while ((size = pread(source, part.data(), part.size(), offset)) > 0) {
+    if (!WriteAll(target.get(), {part.data(), static_cast<size_t>(size)})) return false;
+    offset += size;
+    errno = ETIMEDOUT;
+    if (deadline.HasPassed()) return false;
+  }
+  return size == 0;
 }
 
 bool Extract(const Archive& archive, const std::string& entry, const std::string& path,

@@ -15,7 +15,8 @@ namespace {
 using kainjow::mustache::data;
 using kainjow::mustache::list;
 
-// The fields of the template's sections. Every text goes through Shown, and the template escapes it.
+// The fields of the template's sections. Every text goes through Shown, and the template escapes
+// it.
 data FileFields(const Report& report, size_t number);
 void AddItems(const Report& report, data* file);
 void AddWarnings(const std::vector<Reason>& warnings, data* file);

@@ -9,8 +9,8 @@ namespace {
 // Entries may overlap and claim more bytes than the file has; then nothing lies between them.
 Share Between(const Protection& protection, uint64_t file_size) {
   uint64_t rest = file_size;
-  for (const Share* share : {&protection.verified, &protection.vouched, &protection.unlisted,
-                             &protection.signature}) {
+  for (const Share* share :
+       {&protection.verified, &protection.vouched, &protection.unlisted, &protection.signature}) {
     rest -= std::min(rest, share->bytes);
   }
   return {0, rest};

@@ -105,6 +105,7 @@ Outcome Simulator::Run(const std::string& file) {
   if (options_.abi) {
     const auto problem = installation.LayOut(file, *options_.abi, task.deadline);
     if (problem) task.Fail(cause::kNotInstalled, *problem);
+    if (problem && task.deadline.HasPassed()) task.Fail(cause::kToolTimedOut, SecondsText());
     installed = installation.path();
     task.around.not_laid_out = installation.left_out();
   }

@@ -1,8 +1,8 @@
 // Prints the page of hostile reports, for scripts/check-page to open in a browser.
 #include <iostream>
 
-#include "simulator/program/page.h"
 #include "simulator/program/hostile_report.h"
+#include "simulator/program/page.h"
 
 int main() {
   Page page;

@@ -39,11 +39,12 @@ inline Report HostileReport(const std::string& text) {
   Report report;
   report.file = report.path = report.package_name = text;
   report.verdict = Verdict::kPartlySigned;
-  report.items = {{ItemKind::kPackage, text, text, ItemState::kRefused, {&cause::kToolError, text}},
-                  {ItemKind::kLibrary, text, text, ItemState::kDone, {}},
-                  {ItemKind::kLibrary, text, text, ItemState::kAbsent, {&cause::kToolError, text}},
-                  {ItemKind::kKey, text, text, ItemState::kDone, {}},
-                  {ItemKind::kTool, text, text, ItemState::kRefused, {&cause::kToolNotStarted, text}}};
+  report.items = {
+      {ItemKind::kPackage, text, text, ItemState::kRefused, {&cause::kToolError, text}},
+      {ItemKind::kLibrary, text, text, ItemState::kDone, {}},
+      {ItemKind::kLibrary, text, text, ItemState::kAbsent, {&cause::kToolError, text}},
+      {ItemKind::kKey, text, text, ItemState::kDone, {}},
+      {ItemKind::kTool, text, text, ItemState::kRefused, {&cause::kToolNotStarted, text}}};
   report.warnings = {{&cause::kOtherKey, text}, {&cause::kSeveralSigners, text}};
   report.signer = HostileCertificate(text);
   report.schemes = {text};

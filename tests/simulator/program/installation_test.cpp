@@ -1,6 +1,8 @@
 #include "simulator/program/installation.h"
 
 #include <gtest/gtest.h>
+#include <sys/mman.h>
+#include <unistd.h>
 
 #include <algorithm>
 #include <filesystem>
@@ -104,6 +106,26 @@ TEST(Installation, IsGoneWithItsOwner) {
   }
   EXPECT_FALSE(fs::exists(fs::path(path).parent_path()));
   EXPECT_TRUE(fs::exists(file));
+}
+
+// A file that has no name cannot get another one, as one on another file system cannot.
+TEST(Installation, OfAFileThatCannotBeLinkedIsACopyAndNotForEver) {
+  const TempDir folder;
+  MakePackage(WithLibraries({{"lib/arm64-v8a/liba.so", Bytes(3 << 20, 'a')}}))
+      .WriteTo(folder / "base.apk");
+  const std::string package = ContentOf(folder / "base.apk");
+  const int memory = memfd_create("base.apk", MFD_CLOEXEC);
+  ASSERT_EQ(write(memory, package.data(), package.size()), static_cast<ssize_t>(package.size()));
+  const std::string file = "/proc/self/fd/" + std::to_string(memory);
+  Installation copied;
+  EXPECT_EQ(copied.LayOut(file, InstalledAbi::kPhone, kLater), std::nullopt);
+  EXPECT_NE(copied.path(), file);
+  EXPECT_EQ(ContentOf(copied.path()), package);
+  Installation late;
+  const auto problem = late.LayOut(file, InstalledAbi::kPhone, Deadline(0));
+  close(memory);
+  ASSERT_TRUE(problem.has_value());
+  EXPECT_NE(problem->find("Connection timed out"), std::string::npos) << *problem;
 }
 
 TEST(Installation, LeavesOtherFilesWhereTheyAre) {

@@ -4,9 +4,9 @@
 
 #include <regex>
 
+#include "simulator/phone/text.h"
 #include "simulator/program/hostile_report.h"
 #include "simulator/program/page_template.h"
-#include "simulator/phone/text.h"
 
 namespace {
 
@@ -52,7 +52,8 @@ Item Library(const std::string& name, const Cause* why) {
 TEST(Page, SaysWhatTheTerminalSays) {
   Report report = Example(Verdict::kPartlySigned);
   report.package_name = "com.example.vault";
-  report.items = {Library("lib/arm/a.so", nullptr), Library("lib/arm/b.so", &cause::kLibraryChanged),
+  report.items = {Library("lib/arm/a.so", nullptr),
+                  Library("lib/arm/b.so", &cause::kLibraryChanged),
                   Library("lib/arm/c.so", &cause::kLibraryChanged)};
   report.warnings = {{&cause::kSchemesStripped, "v2"}};
   report.signer.emplace();
@@ -99,13 +100,15 @@ TEST(Page, HasTheSameMarkupWhateverFilesAreCalled) {
   const std::string hostile = PageOf({HostileReport(kHostileText), HostileReport(kHostileText)});
   EXPECT_EQ(TagsOf(hostile), TagsOf(plain));
   EXPECT_GT(Count(hostile, "&lt;script&gt;"), 70U);
-  EXPECT_TRUE(Has(hostile, "&quot;&apos;&gt;&lt;a href=&apos;javascript:alert(1)&apos;&gt;"
-                           "&amp;lt;&amp;{{verdict}}{{{verdict}}}{{&amp;verdict}}--&gt;"));
+  EXPECT_TRUE(Has(hostile,
+                  "&quot;&apos;&gt;&lt;a href=&apos;javascript:alert(1)&apos;&gt;"
+                  "&amp;lt;&amp;{{verdict}}{{{verdict}}}{{&amp;verdict}}--&gt;"));
 }
 
 TEST(Page, ShowsAsBytesWhatIsNoTextOrTurnsIt) {
   std::string page = PageOf(HostileReport(kHostileText));
-  EXPECT_TRUE(Has(page, "\\x1b]0;x\\x07\\x09\\x0a\\x0d\\x7f\\xff\\xc3\\xc2\\x9b\\xd8\\x9c\\xe2\\x80"));
+  EXPECT_TRUE(
+      Has(page, "\\x1b]0;x\\x07\\x09\\x0a\\x0d\\x7f\\xff\\xc3\\xc2\\x9b\\xd8\\x9c\\xe2\\x80"));
   for (const char* turned : {"\u009b", "\u061c", "\u200b", "\u202e", "\u2066", "\ufeff"}) {
     EXPECT_FALSE(Has(page, turned));
   }
@@ -180,8 +183,9 @@ TEST(Page, ListsTheFilesWhereThereAreSeveral) {
   EXPECT_FALSE(Has(PageOf(Example(Verdict::kSigned)), "<nav"));
   const std::string page = PageOf({Example(Verdict::kRefused), Example(Verdict::kTrustedJar)});
   EXPECT_TRUE(Has(page, "<p>2 files: 1 trusted JAR, 1 refused</p>"));
-  EXPECT_TRUE(Has(page, "<li><span class=\"verdict good\">TRUSTED JAR</span> "
-                        "<a class=\"name\" href=\"#file-2\">base.apk</a></li>"));
+  EXPECT_TRUE(Has(page,
+                  "<li><span class=\"verdict good\">TRUSTED JAR</span> "
+                  "<a class=\"name\" href=\"#file-2\">base.apk</a></li>"));
   EXPECT_TRUE(Has(page, "<article id=\"file-2\""));
 }
 
@@ -195,18 +199,21 @@ TEST(Page, LeavesOutWhatThereIsNot) {
 
 TEST(Page, DrawsEachPartOfThePackage) {
   const std::string page = PageOf(HostileReport("x"));
-  EXPECT_TRUE(Has(page, "verified 30.0 %, listed and not checked 20.0 %, not listed 10.0 %, the "
-                        "signature itself 5.0 %, between the entries 35.0 %</desc>"));
+  EXPECT_TRUE(Has(page,
+                  "verified 30.0 %, listed and not checked 20.0 %, not listed 10.0 %, the "
+                  "signature itself 5.0 %, between the entries 35.0 %</desc>"));
   EXPECT_EQ(Count(page, "<rect fill=\"url(#unlisted)\" x="), 1U);
-  EXPECT_TRUE(Has(page, "<td class=\"number\">3</td><td class=\"number\">300</td>"
-                        "<td class=\"number\">30.0</td>"));
+  EXPECT_TRUE(Has(page,
+                  "<td class=\"number\">3</td><td class=\"number\">300</td>"
+                  "<td class=\"number\">30.0</td>"));
 }
 
 TEST(Page, ShowsWhereTheChainBreaks) {
   const std::string page = PageOf(HostileReport("x"));
   EXPECT_TRUE(Has(page, "<span class=\"link\">key</span> <span class=\"at\">x</span>"));
   EXPECT_TRUE(Has(page, "<span class=\"link\">certificate, where it breaks</span>"));
-  EXPECT_TRUE(Has(page, "<span class=\"link\">manifest</span> <span class=\"at\">not reached</span>"));
+  EXPECT_TRUE(
+      Has(page, "<span class=\"link\">manifest</span> <span class=\"at\">not reached</span>"));
 }
 
 TEST(Page, TellsSchemesOfOneCertificateTogether) {
