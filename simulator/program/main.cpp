@@ -90,7 +90,7 @@ std::optional<std::string> Presenter::Objection() const {
   inputs.insert(inputs.end(), options_.trust.begin(), options_.trust.end());
   inputs.push_back(options_.tool);
   if (journal_.IsSameAs(page_file_)) return "--journal and --html name the same file";
-  if (const auto objection = journal_.Objection(inputs)) return objection;
+  if (auto objection = journal_.Objection(inputs)) return objection;
   return page_file_.Objection(inputs);
 }
 

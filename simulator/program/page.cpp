@@ -32,7 +32,8 @@ Item Short(Item item);
 CertificateFacts Short(CertificateFacts certificate);
 list OneIf(bool condition);
 void SetMark(Mark mark, data* line);
-void SetLines(const char* name, list lines, size_t count, const std::string& remark, data* file);
+void SetLines(const char* name, const list& lines, size_t count, const std::string& remark,
+              data* file);
 std::string Grouped(uint64_t number);
 std::string Decimal(double number);
 const char* CodeOf(Mood mood);
@@ -242,7 +243,8 @@ void SetMark(Mark mark, data* line) {
 
 // Sets the section "NAME_shown" with the section `name` in it, of `count` lines those that are
 // shown, and how many are not.
-void SetLines(const char* name, list lines, size_t count, const std::string& remark, data* file) {
+void SetLines(const char* name, const list& lines, size_t count, const std::string& remark,
+              data* file) {
   const size_t hidden = count - lines.size();
   const std::string text = Grouped(hidden) + " more" + (remark.empty() ? "" : "; " + remark);
   file->set(std::string(name) + "_shown", OneIf(!lines.empty()));

@@ -86,7 +86,7 @@ const char* SymbolOf(Mark mark, bool has_utf8) {
 std::string NameOf(const Item& item) { return item.kind == ItemKind::kKey ? "key" : item.name; }
 
 std::string OutcomeOf(const Item& item, Verdict verdict) {
-  const std::string reason = item.reason.Text();
+  std::string reason = item.reason.Text();
   if (item.state == ItemState::kDone) {
     if (item.kind == ItemKind::kPackage) return "signed with the payload of that key";
     if (item.kind == ItemKind::kJar) return "signed, without data";
