@@ -50,23 +50,28 @@ void ManifestSections::reset(const uint8_t* text, size_t size) {
   attributes_.clear();
   attributes_.reserve(std::min(size / kShortAttribute, kManyAttributes));
   ends_.clear();
-  patience_ = kFewAttributes;
+  patience_ = kLittleText;
 }
 
-// A section that has doubled is put in order, which drops what repeats: so it takes memory for
-// twice its names at the most, and the time for it stays that of putting each name in order a few
-// times.
+// A section is put in order, which drops what repeats, each time that as much text has followed as
+// its names take and twice as many attributes need: so what repeats takes no more memory than what
+// does not, and the names are compared again only when there is as much to be read, however few
+// and long they are.
 void ManifestSections::add(const ManifestAttribute& attribute) {
+  constexpr size_t kTwoAttributes = 10;
   attributes_.push_back(attribute);
-  if (attributes_.size() - openStart() < patience_) return;
+  if (attribute.name.start < patience_) return;
   order();
-  patience_ = kFewAttributes + 2 * (attributes_.size() - openStart());
+  patience_ = attribute.name.start + kLittleText;
+  for (size_t i = openStart(); i < attributes_.size(); ++i) {
+    patience_ += attributes_[i].name.length + kTwoAttributes;
+  }
 }
 
 void ManifestSections::endSection() {
   order();
   ends_.push_back(static_cast<uint32_t>(attributes_.size()));
-  patience_ = kFewAttributes;
+  patience_ = kLittleText + (attributes_.empty() ? 0 : attributes_.back().name.start);
 }
 
 // Puts the section at hand in the order of its names. Of equal names the one that is last in the

@@ -91,13 +91,13 @@ class ManifestSections {
   void endSection();
 
  private:
-  static constexpr size_t kFewAttributes = 64;
+  static constexpr size_t kLittleText = 1024;
 
   size_t openStart() const { return ends_.empty() ? 0 : ends_.back(); }
   void order();
 
   const char* text_ = nullptr;
   std::vector<ManifestAttribute> attributes_;
-  std::vector<uint32_t> ends_;        // of each section in attributes_
-  size_t patience_ = kFewAttributes;  // so many attributes in the section at hand are too many
+  std::vector<uint32_t> ends_;     // of each section in attributes_
+  size_t patience_ = kLittleText;  // where in the text the section at hand is put in order next
 };

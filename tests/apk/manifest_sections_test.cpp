@@ -3,6 +3,8 @@
 
 #include <gtest/gtest.h>
 
+#include <ctime>
+#include <functional>
 #include <map>
 #include <random>
 #include <string>
@@ -124,6 +126,43 @@ TEST(ManifestSection, OfEqualNamesTheLastInTheTextCounts) {
   for (size_t i = 0; i < expected.size(); ++i) {
     EXPECT_EQ(Pairs(expected[i].begin(), expected[i].end()), PairsOf(table.sections[i])) << i;
   }
+}
+
+double ProcessorTime() {
+  timespec now = {};
+  clock_gettime(CLOCK_PROCESS_CPUTIME_ID, &now);
+  return static_cast<double>(now.tv_sec) + static_cast<double>(now.tv_nsec) * 1e-9;
+}
+
+double SecondsFor(const std::function<void()>& work) {
+  const double start = ProcessorTime();
+  work();
+  return ProcessorTime() - start;
+}
+
+// Names that are few, long and alike, and very many short ones: whichever come first, the long ones
+// are compared with each other a few times, and not each time that the others have filled a table.
+TEST(ManifestSection, LongNamesTakeNoTimeForTheShortOnesThatFollow) {
+  const std::string long_name(2 << 20, 'B');
+  constexpr int kShortNames = 1000000;
+  Table table(32 << 20);
+  const auto add_long = [&] { table.Add(long_name + "1", "1").Add(long_name + "2", "2"); };
+  const auto add_short = [&] {
+    for (int i = 0; i < kShortNames; ++i) table.Add("A", "1");
+  };
+  const double afterwards = SecondsFor([&] {
+    add_short();
+    add_long();
+    table.End();
+  });
+  const double before = SecondsFor([&] {
+    add_long();
+    add_short();
+    table.End();
+  });
+  EXPECT_EQ(PairsOf(table.sections[0]), PairsOf(table.sections[1]));
+  EXPECT_EQ(3u, table.sections[1].size());
+  EXPECT_LT(before, 5 * afterwards + 0.1);
 }
 
 }  // namespace
