@@ -44,4 +44,20 @@ TEST(Main, AFifoIsNoArchiveAndNothingToWaitFor) {
   EXPECT_TRUE(Says(run, "Zip archive is not valid for fd=3")) << run.errors;
 }
 
+// The line is written when the process ends, after the steps.
+TEST(Main, ALineThatStandardOutputCannotTakeEndsTheProcessAfterItsSteps) {
+  Package package = MakePackage();
+  package.Item("META-INF/CERT.RSA").data = ToBytes("no block");
+  const DiskFile file(package.Build());
+  const ProcessResult run = RunProcess({"python3", "-c", R"(
+import os, signal, subprocess, sys
+reader, writer = os.pipe()
+os.close(reader)
+tool = subprocess.run(sys.argv[1:], stdin=subprocess.DEVNULL, stdout=writer)
+sys.exit(tool.returncode != -signal.SIGPIPE))",
+                                        ToolPath(), file.path()});
+  EXPECT_EQ(run.status, 0) << run.errors;
+  EXPECT_TRUE(Says(run, "VeltSign finished: 65536.")) << run.errors;
+}
+
 }  // namespace

@@ -1,5 +1,6 @@
 // What a hostile file can reach by rules that are lenient or trusting on purpose, and where that
 // ends. docs/threat-model.md says why each is as it is.
+#include <sys/mman.h>
 #include <sys/wait.h>
 
 #include <cerrno>
@@ -176,6 +177,28 @@ TEST(Threat, ALibraryThatIsWrittenToInPlaceAfterItsChecksIsSigned) {
   const std::string library = device.Path("lib/arm64/libfoo.so");
   device.phone.before_integrity = [&] { Patch(library, 5, 'F'); };
   EXPECT_EQ(BytesSigned(device)[library], "\177ELF Foo");
+}
+
+// A page that is to be written back already takes more writes without a sign of them in the times.
+TEST(Threat, ALibraryThatIsWrittenToThroughAMappingAfterItWasReadIsSigned) {
+  Device device(MakePackage());
+  device.Install("lib/arm64/libfoo.so", kLibrary);
+  const std::string library = device.Path("lib/arm64/libfoo.so");
+  const int fd = open(library.c_str(), O_RDWR);
+  void* const mapped = mmap(nullptr, kLibrary.size(), PROT_WRITE, MAP_SHARED, fd, 0);
+  ASSERT_NE(mapped, MAP_FAILED);
+  volatile char* const bytes = static_cast<char*>(mapped);
+  bytes[5] = 'f';  // as it was
+  int opened = 0;
+  device.phone.before_open = [&](const char* path, int) {
+    opened += library == path;
+    if (opened != 2) return;
+    usleep(20000);  // the clock of file systems is coarse
+    bytes[5] = 'F';
+  };
+  EXPECT_EQ(BytesSigned(device)[library], "\177ELF Foo");
+  munmap(mapped, kLibrary.size());
+  close(fd);
 }
 
 TEST(Threat, APackageThatIsWrittenToInPlaceAfterItsChecksIsSigned) {
