@@ -51,7 +51,7 @@ class Apk {
   bool IsApk() const { return is_apk_; }
   // The package attribute of the Android manifest, UTF-8; may be empty.
   const std::string& GetPackageName() const { return package_name_; }
-  // The signer's RSA modulus, big-endian, without leading zero; empty unless the signature
+  // The signer's RSA modulus, big-endian, less one leading zero byte; empty unless the signature
   // verified.
   const std::vector<uint8_t>& GetManufacturerKey() const { return manufacturer_key_; }
   // The Android manifest asks for the secure-storage permission.

@@ -204,6 +204,14 @@ TEST(ValidateManifest, ASignatureFileWhoseSectionDoesNotEndHasNoDigest) {
   EXPECT_EQ(LogOf(WithSignatureFile(ManifestDigests({"SHA1-Digest"}, {}).text())), RefusedTwice());
 }
 
+TEST(ValidateManifest, SectionsForSingleEntriesAreNotLookedAt) {
+  const std::string wrong =
+      JarText().Section("classes.dex", {"SHA-256-Digest"}, ToBytes("other bytes")).text();
+  const std::string right = ManifestDigests({"SHA-256-Digest"}, {}).EndSection().text();
+  EXPECT_EQ(LogOf(WithSignatureFile(wrong + right)), Records());
+  EXPECT_EQ(LogOf(WithSignatureFile(right + wrong)), Records());
+}
+
 TEST(ValidateManifest, TheMainAttributesDigestIsIgnored) {
   const Bytes manifest = MakePackage().Item(kManifestName).data;
   EXPECT_EQ(LogOf(WithSignatureFile(

@@ -62,6 +62,17 @@ TEST(VeltSignFd, WaitsInSteps10MillisecondsLongUntilTheValueSettles) {
             Events({kSelf, "sleep 10000", kSelf, "sleep 10000", kSelf, "sign 7 0300aabbcc"}));
 }
 
+// A quarter of an hour, on a phone whose clock stands still.
+TEST(VeltSignFd, WaitsHoweverLongTheValueTakes) {
+  constexpr size_t kSteps = 90000;
+  Phone phone;
+  phone.integrity.assign(kSteps, "ffffffff\n");
+  phone.integrity.push_back("1f\n");
+  EXPECT_EQ(VeltSignFd(7, kPayload), 0U);
+  EXPECT_EQ(phone.events.size(), 2 * kSteps + 2);
+  EXPECT_EQ(phone.events.back(), "sign 7 0300aabbcc");
+}
+
 TEST(VeltSignFd, AValueThatSettlesToZeroMayNotSign) {
   Phone phone;
   phone.integrity = {"ffffffff\n", "0\n"};
