@@ -155,8 +155,9 @@ void SignLibrary(ApkTools::Apk& apk, const std::string& entry_name, const std::s
     LogError("Error %d: %s.\n", error, strerror(error));
     return;
   }
-  // Deliberate: signed is only the very file whose bytes were verified, unchanged since. An entry's
-  // name may lead into a folder that others write to (docs/decisions/the-file-that-was-read.md).
+  // Deliberate: signed is only the very file whose bytes were verified, and with the times that it
+  // had. An entry's name may lead into a folder that others write to
+  // (docs/decisions/the-file-that-was-read.md).
   struct stat opened = {};
   fstat(library.get(), &opened);
   if (!IsSameFile(verified, opened)) return ReportNotVerified(target);
