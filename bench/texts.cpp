@@ -55,6 +55,12 @@ constexpr Text kTexts[] = {
     {"one name, again and again", [] { return Repeat([](size_t) { return "A: 1\n"; }); }},
     {"a thousand names, again and again",
      [] { return Repeat([](size_t i) { return std::to_string(i % 1000) + ": 1\n"; }); }},
+    {"two long names, then one again and again",
+     [] {
+       return Repeat([](size_t i) {
+         return i < 2 ? std::string(kTextSize / 4, 'B') + std::to_string(i) + ": 1\n" : "A: 1\n";
+       });
+     }},
     {"all names different, one section",
      [] { return Repeat([](size_t i) { return ShortName(i) + ": 1\n"; }); }},
     {"one attribute a section", [] { return Repeat([](size_t) { return "A: 1\n\n"; }); }},
