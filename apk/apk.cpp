@@ -11,10 +11,6 @@ namespace ApkTools {
 // it at each use, so that one place decides which entry the manifest is.
 const char* Apk::kMANIFEST_MF = "META-INF/MANIFEST.MF";
 
-Apk::Apk(int fd) { Init(fd, nullptr); }
-
-Apk::~Apk() = default;
-
 void Apk::Init(int fd, const char* path) {
   zip_handle_ = nullptr;
   is_apk_ = is_good_apk_ = dex_checked_ = is_good_zip_ = false;

@@ -24,9 +24,9 @@ class Apk {
   static const char* kMANIFEST_MF;
 
   // As Init(fd, nullptr) on an empty object.
-  explicit Apk(int fd);
+  explicit Apk(int fd) { Init(fd, nullptr); }
   // Closes neither the archive nor the descriptor: the process ends right after the run.
-  ~Apk();
+  ~Apk() = default;
   Apk(const Apk&) = delete;
   Apk& operator=(const Apk&) = delete;
 

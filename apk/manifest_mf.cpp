@@ -42,7 +42,7 @@ class Parser {
   // count.
   bool parse() {
     while (cursor_ < size_) {
-      if (!step()) return false;
+      if (!isExpectedState() || !step()) return false;
     }
     return true;
   }
@@ -57,29 +57,34 @@ class Parser {
     P_EOL,           // at a line break, what the next line is being open
   };
 
+  // Deliberate: no step leaves another state behind, and no test gets here with one. The guard
+  // stays, so that one which is added and not handled below cannot make a manifest pass.
+  bool isExpectedState() const {
+    const bool is_expected = state_ <= P_EOL;
+    if (!is_expected) LogError("Parse manifest: Unexpected state.\n");
+    return is_expected;
+  }
+
   bool step() {
     switch (state_) {
       case P_START:
         skipToName();
-        return true;
+        break;
       case P_KEY:
         return readName();
       case P_COLON:
         return passColon();
       case P_VALUE:
         pending_.value = readLine();
-        return true;
+        break;
       case P_CONTINUATION:
         continueValue();
-        return true;
+        break;
       case P_EOL:
         endLine();
-        return true;
+        break;
     }
-    // Deliberate: no step leaves another state behind, and no test gets here. The guard stays, so
-    // that one which is added and not handled above cannot make a manifest pass.
-    LogError("Parse manifest: Unexpected state.\n");
-    return false;
+    return true;
   }
 
   // Deliberate: a TAB is not skipped; it starts a name.

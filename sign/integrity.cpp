@@ -4,7 +4,6 @@
 #include <unistd.h>
 
 #include <cstdio>
-#include <memory>
 
 namespace {
 
@@ -30,14 +29,13 @@ bool FormatIntegrityPath(int pid, char (&path)[kPathSize]) {
 }
 
 bool ReadHexadecimal(const char* path, uint32_t* value) {
-  struct CloseFile {
-    void operator()(FILE* file) const { fclose(file); }
-  };
-  const std::unique_ptr<FILE, CloseFile> file(fopen(path, "r"));
+  FILE* const file = fopen(path, "r");
+  if (file == nullptr) return false;
   unsigned int read = 0;
-  if (file == nullptr || fscanf(file.get(), "%x", &read) != 1) return false;
-  *value = read;
-  return true;
+  const bool is_number = fscanf(file, "%x", &read) == 1;
+  fclose(file);
+  if (is_number) *value = read;
+  return is_number;
 }
 
 }  // namespace

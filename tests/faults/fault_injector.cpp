@@ -88,7 +88,9 @@ Main* real_main = nullptr;
 
 int ArmAndStart(int argc, char** argv, char** environment) {
   Arm();
-  return real_main(argc, argv, environment);
+  const int status = real_main(argc, argv, environment);
+  calls_left = 0;  // what is called from here on is not the tool's
+  return status;
 }
 
 using StartMain = int(Main*, int, char**, void (*)(), void (*)(), void (*)(), void*);
