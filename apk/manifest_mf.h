@@ -15,7 +15,8 @@ class ManifestMf {
   using Sections = ManifestSections;
 
   // Holds no text and no sections, and is not valid. An object that was moved from has no sections
-  // either; what pointed into its text points into the one that it was moved to.
+  // either, and still tells the result; what pointed into its text points into the one that it was
+  // moved to.
   ManifestMf() = default;
   ManifestMf(ManifestMf&&) = default;
   ManifestMf& operator=(ManifestMf&&) = default;

@@ -14,8 +14,9 @@
 bool IsSameFile(const struct stat& before, const struct stat& after);
 
 // Reads the regular file at `path` into `out`, which then has exactly the file's size in bytes, and
-// tells in `state`, unless it is null, what fstat said of it before a byte was read. Never waits
-// and never aborts, whatever `path` names. False, with both untouched, when the file
+// tells in `state`, unless it is null, what fstat said of it before a byte was read. Does not
+// wait for a writer, nor abort for a size that cannot be had, whatever `path` names. False, with
+// both untouched, when the file
 //   - cannot be opened: "Can't open file: %s\n", or
 //   - has no size that can be found, is not a regular file, or is larger than can be had in memory:
 //     "Can't read file: %s (streamoff=%zd)\n" with -1 for the size.
