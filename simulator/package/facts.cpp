@@ -43,11 +43,7 @@ PackageFacts LookAt(const std::string& path) {
     facts.error = errno;
     return facts;
   }
-  const bool is_openable = S_ISREG(state.st_mode) || S_ISDIR(state.st_mode);
-  if (!is_openable) {
-    facts.kind = FileKind::kSpecial;
-    return facts;
-  }
+  // As the tool does: nothing waits for a writer, and a socket cannot be opened.
   const int fd = open(path.c_str(), O_RDONLY | O_CLOEXEC | O_NONBLOCK | O_NOCTTY);
   if (fd < 0) {
     facts.error = errno;
@@ -57,6 +53,8 @@ PackageFacts LookAt(const std::string& path) {
   facts.is_read_only = fstatvfs(fd, &system) == 0 && (system.f_flag & ST_RDONLY) != 0;
   if (S_ISDIR(state.st_mode)) {
     facts.kind = FileKind::kFolder;
+  } else if (!S_ISREG(state.st_mode)) {
+    facts.kind = FileKind::kSpecial;
   } else {
     facts.size = static_cast<uint64_t>(state.st_size);
     facts.kind = KindOf(fd, facts.size);

@@ -28,6 +28,15 @@ std::vector<std::string> NamesWhere(const PackageFacts& facts, Predicate holds) 
 
 }  // namespace
 
+// mknod makes a socket of it that nobody listens at.
+TEST(FileKind, OfWhatCannotBeOpenedIsNotTold) {
+  const TempDir folder;
+  const std::string socket = folder / "socket";
+  ASSERT_EQ(mknod(socket.c_str(), S_IFSOCK | 0600, 0), 0);
+  EXPECT_EQ(LookAt(socket).error, ENXIO);
+  EXPECT_EQ(LookAt(folder / "none").error, ENOENT);
+}
+
 TEST(FileKind, IsToldByWhatTheFileIs) {
   const TempDir folder;
   const std::string pipe = folder / "pipe";
