@@ -14,6 +14,7 @@ namespace {
 Item OwnItem(const RunRecord& run, const PackageFacts& facts);
 ItemKind KindOf(const RunRecord& run);
 Reason WhyJarRefused(const RunRecord& run);
+Reason WhyToolIsAnother(const RunRecord& run);
 void AddKeyItems(const RunRecord& run, std::vector<Item>* items);
 void AddToolItems(const RunRecord& run, const Item& own, std::vector<Item>* items);
 Verdict Judge(const std::vector<Item>& items);
@@ -34,12 +35,13 @@ Report MakeReport(const Events& events, const PackageFacts& facts, const Circums
     report.items = {Refused(ItemKind::kTool, "tool", around.failure)};
     return report;
   }
-  if (run.is_silent && !run.signal && run.status == 0) {
-    const Reason reason = WhyNotLookedAt(facts, around.has_standard_input);
+  if (run.is_silent && !run.signal) {
+    Reason reason;
+    if (run.status == 0) reason = WhyNotLookedAt(facts, around.has_standard_input);
     const bool is_known = reason.cause != nullptr;
     report.verdict = is_known ? Verdict::kNotLookedAt : Verdict::kNotSimulated;
     report.items = {is_known ? Refused(ItemKind::kFile, "file", reason)
-                             : Refused(ItemKind::kTool, "tool", {&cause::kToolSilent, ""})};
+                             : Refused(ItemKind::kTool, "tool", WhyToolIsAnother(run))};
     return report;
   }
   const Item own = OwnItem(run, facts);
@@ -118,6 +120,12 @@ Reason WhyJarRefused(const RunRecord& run) {
     if (why && *why != "Entry not found") return {&cause::kAndroidManifestDamaged, ""};
   }
   return {&cause::kJarNotTrusted, DescribeErrno(run.verify_error.value_or(0))};
+}
+
+// Of a run without a word: what ends with another status than 0 is not the tool either.
+Reason WhyToolIsAnother(const RunRecord& run) {
+  if (run.status == 0) return {&cause::kToolSilent, ""};
+  return {&cause::kToolFailed, std::to_string(run.status)};
 }
 
 void AddKeyItems(const RunRecord& run, std::vector<Item>* items) {

@@ -298,6 +298,11 @@ TEST(MakeReport, ToolThatSaysNothingOfAFileThatItCouldOpenIsNotTheTool) {
   const Report report = Made({});
   EXPECT_EQ(report.verdict, Verdict::kNotSimulated);
   EXPECT_EQ(ItemsOf(report), Lines({"tool refused tool-silent"}));
+  PackageFacts missing;
+  missing.error = ENOENT;
+  const Report failed = Made({}, missing, {}, {{"event", "exit"}, {"status", 1}});
+  EXPECT_EQ(failed.verdict, Verdict::kNotSimulated);
+  EXPECT_EQ(ItemsOf(failed), Lines({"tool refused tool-failed 1"}));
 }
 
 TEST(MakeReport, FailureOfTheSimulationIsNoVerdictOnTheFile) {

@@ -124,6 +124,12 @@ TEST(ExitStatus, ThreeWhenTheToolIsAnotherProgramThatDoesNothing) {
   EXPECT_EQ(result.errors, "apktoolkit-sim: " + probe.path() +
                                ": the tool neither said nor did anything, though the file can be "
                                "opened\n");
+  const Probe failing({"exit 1"});
+  const ProcessResult failed = Simulated({failing.path()});
+  EXPECT_EQ(failed.status, 3);
+  EXPECT_EQ(FirstLines(failed, 3),
+            Lines({"NOT SIMULATED  " + failing.path(), "  ✗ tool  it ended with status 1",
+                   "      Check --tool: apktoolkit ends with 0 for every file."}));
 }
 
 TEST(ExitStatus, ThreeWhenStandardOutputIsFullOrClosed) {
