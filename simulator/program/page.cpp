@@ -173,7 +173,8 @@ void AddSigners(const Report& report, data* file) {
   list lines;
   for (size_t i = 0; i < std::min(signers.size(), kMostPageLines); ++i) {
     list rows;
-    for (const auto& [label, value] : CertificateRows(Short(signers[i].second))) {
+    const bool is_jar_signer = i == 0 && report.signer.has_value();
+    for (const auto& [label, value] : CertificateRows(Short(signers[i].second), is_jar_signer)) {
       data row("term", Shown(label));
       row.set("value", Shown(value));
       rows.push_back(row);

@@ -28,7 +28,7 @@ class Printer {
  private:
   void PrintItem(const Item& item, size_t width);
   void PrintWrapped(const std::string& text, size_t indent);
-  void PrintCertificate(const CertificateFacts& certificate);
+  void PrintCertificate(const CertificateFacts& certificate, bool is_jar_signer);
   std::string Shown(std::string_view bytes) const { return Printable(bytes, look_); }
 
   const Report& report_;
@@ -118,13 +118,13 @@ void Printer::PrintWrapped(const std::string& text, size_t indent) {
 void Printer::PrintSigner() {
   if (!report_.signer) return;
   out_ << "  signer\n";
-  PrintCertificate(*report_.signer);
+  PrintCertificate(*report_.signer, true);
   out_ << "    schemes: " << Shown(Joined(report_.schemes)) << '\n';
   PrintProtection();
 }
 
-void Printer::PrintCertificate(const CertificateFacts& certificate) {
-  for (const auto& [label, value] : CertificateRows(certificate)) {
+void Printer::PrintCertificate(const CertificateFacts& certificate, bool is_jar_signer) {
+  for (const auto& [label, value] : CertificateRows(certificate, is_jar_signer)) {
     out_ << "    " << label << ": " << Shown(value) << '\n';
   }
 }
@@ -132,7 +132,7 @@ void Printer::PrintCertificate(const CertificateFacts& certificate) {
 void Printer::PrintNewerSigners() {
   for (const NewerSignerFacts& signer : report_.newer) {
     out_ << "  signer of " << Shown(signer.scheme) << '\n';
-    PrintCertificate(signer.certificate);
+    PrintCertificate(signer.certificate, false);
   }
 }
 

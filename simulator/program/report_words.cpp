@@ -118,7 +118,7 @@ std::string SignerText(const CertificateFacts& signer, const char* ellipsis) {
 }
 
 std::vector<std::pair<std::string, std::string>> CertificateRows(
-    const CertificateFacts& certificate) {
+    const CertificateFacts& certificate, bool is_jar_signer) {
   const PublicKey& key = certificate.key;
   std::vector<std::pair<std::string, std::string>> rows = {
       {"certificate DN", certificate.subject},
@@ -127,8 +127,9 @@ std::vector<std::pair<std::string, std::string>> CertificateRows(
       {"key size (bits)", std::to_string(key.bits)},
       {"public key SHA-256 digest", key.sha256}};
   if (!key.modulus_sha256.empty()) {
+    const char* const use = is_jar_signer ? ": what the kernel gets" : "";
     rows.emplace_back("modulus SHA-256 digest",
-                      key.modulus_sha256 + " (of the modulus alone: what the kernel gets)");
+                      key.modulus_sha256 + " (of the modulus alone" + use + ")");
   }
   return rows;
 }

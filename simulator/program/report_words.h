@@ -48,8 +48,9 @@ std::string TextOf(const Link& link);
 std::string SignerText(const CertificateFacts& signer, const char* ellipsis);
 
 // Label and value for each fact. The labels are those of apksigner, so that one search finds both.
+// The kernel gets the key of the JAR signature's signer, and no other.
 std::vector<std::pair<std::string, std::string>> CertificateRows(
-    const CertificateFacts& certificate);
+    const CertificateFacts& certificate, bool is_jar_signer);
 
 // Such as "v1, v2".
 std::string Joined(const std::vector<std::string>& schemes);

@@ -229,3 +229,14 @@ TEST(Page, TellsSchemesOfOneCertificateTogether) {
   EXPECT_TRUE(Has(page, "<h4>Signed with v1, v2, v3</h4>"));
   EXPECT_TRUE(Has(page, "<h4>Signed with v3</h4>"));
 }
+
+TEST(Page, SaysOfTheJarSignerAloneThatTheKernelGetsTheKey) {
+  Report report = Example(Verdict::kRefused);
+  CertificateFacts certificate;
+  certificate.key.modulus_sha256 = std::string(64, '0');
+  report.newer = {{"v2", certificate}};
+  report.signer.reset();
+  EXPECT_TRUE(Has(PageOf(report), "0 (of the modulus alone)</dd>"));
+  report.signer = certificate;
+  EXPECT_TRUE(Has(PageOf(report), "0 (of the modulus alone: what the kernel gets)</dd>"));
+}

@@ -37,11 +37,19 @@ TEST(ReportWords, KeyOfUnknownSizeHasItsAlgorithmAlone) {
   signer.subject = "CN=a";
   signer.key.algorithm = "1.2.3";
   EXPECT_EQ(SignerText(signer, "..."), "CN=a, 1.2.3");
-  EXPECT_EQ(CertificateRows(signer).size(), 5U);
+  EXPECT_EQ(CertificateRows(signer, true).size(), 5U);
   signer.key.bits = 512;
   signer.key.modulus_sha256 = "0123456789abcdef";
   EXPECT_EQ(SignerText(signer, "..."), "CN=a, 1.2.3-512, key 01234567...abcdef");
-  EXPECT_EQ(CertificateRows(signer)[5].first, "modulus SHA-256 digest");
+  EXPECT_EQ(CertificateRows(signer, true)[5].first, "modulus SHA-256 digest");
+}
+
+TEST(ReportWords, KernelGetsTheKeyOfTheJarSignerAlone) {
+  CertificateFacts signer;
+  signer.key.modulus_sha256 = "0123";
+  EXPECT_EQ(CertificateRows(signer, true)[5].second,
+            "0123 (of the modulus alone: what the kernel gets)");
+  EXPECT_EQ(CertificateRows(signer, false)[5].second, "0123 (of the modulus alone)");
 }
 
 TEST(ReportWords, LinkBeyondABreakSaysNothingOfItself) {
