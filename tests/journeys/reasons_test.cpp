@@ -321,7 +321,7 @@ TEST_F(Reason, LibrariesThatDoNotLieBesideThePackage) {
             Lines({"SIGNED  base.apk" + ByRsa2048(), kSigned,
                    "  – lib/arm64/libvault.so  " + absent, "  – lib/arm/libvault.so    " + absent,
                    "      Nothing, where the phone is of another kind. For a package that lies",
-                   "      alone: --install.",
+                   "      alone: --install; for all processors: --install=all.",
                    "  ✓ key                    registered for com.example.vault", "-> 0"}));
   EXPECT_EQ(Told(1, {"--strict"}), Lines({"PARTLY SIGNED  base.apk" + ByRsa2048(), "-> 1"}));
   EXPECT_EQ(Told(5, {"--install=all"}),
