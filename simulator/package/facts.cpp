@@ -64,6 +64,11 @@ PackageFacts LookAt(const std::string& path) {
   return facts;
 }
 
+AndroidManifest ReadAndroidManifest(const Archive& archive) {
+  return ParseCompiledManifest(
+      archive.Read(kAndroidManifestName, kMostAndroidManifest).value_or(""));
+}
+
 std::vector<std::string> NewerSchemes(const PackageFacts& facts) {
   std::vector<std::string> schemes;
   for (const NewerSignerFacts& signer : facts.newer) {
@@ -97,9 +102,7 @@ void ReadArchive(int fd, PackageFacts* facts) {
   const Archive archive(fd, &facts->archive_result);
   if (facts->archive_result != 0) return;
   facts->is_package = archive.Has(kAndroidManifestName);
-  if (const auto manifest = archive.Read(kAndroidManifestName, kMostAndroidManifest)) {
-    facts->manifest = ParseCompiledManifest(*manifest);
-  }
+  facts->manifest = ReadAndroidManifest(archive);
   facts->jar = ReadJarSignature(archive);
   facts->jar.has_manifest = archive.Has(kManifestName);
   const auto listing = archive.Read(kManifestName, kMostManifest);

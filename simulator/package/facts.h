@@ -71,6 +71,9 @@ struct PackageFacts {
   std::vector<ArchiveEntry> libraries;
 };
 
+// What its compiled AndroidManifest.xml says; nothing where that cannot be read.
+AndroidManifest ReadAndroidManifest(const Archive& archive);
+
 // Looks at the file at `path`. A pipe or a device is not opened.
 PackageFacts LookAt(const std::string& path);
 

@@ -214,7 +214,8 @@ inline constexpr Cause kLibraryInPackage = {
     "Nothing: it is loaded from the package."};
 inline constexpr Cause kLibraryNotInstalled = {
     "library-not-installed", "no libraries for its processor lie beside the package",
-    "Nothing, where the phone is of another kind. For a package that lies alone: --install; for all "
+    "Nothing, where the phone is of another kind. For a package that lies alone: --install; for "
+    "all "
     "processors: --install=all."};
 inline constexpr Cause kLibraryMissing = {
     "library-missing", "it does not lie beside the package, where others are",

@@ -12,6 +12,7 @@
 #include <map>
 
 #include "simulator/package/archive.h"
+#include "simulator/package/facts.h"
 
 namespace {
 
@@ -72,6 +73,7 @@ std::optional<std::string> Installation::LayOut(const std::string& file, Install
   if (source.get() < 0) return {};
   const Archive archive(source.get(), &result);
   if (result != 0) return {};
+  if (ReadAndroidManifest(archive).extracts_libraries == false) return {};
   const Layout layout = PlanLayout(archive.Entries("lib/", ".so"), abi, &left_out_);
   if (layout.empty()) return {};
 

@@ -23,8 +23,8 @@ class Installation {
   Installation(const Installation&) = delete;
   Installation& operator=(const Installation&) = delete;
 
-  // Lays out the package at `file`. What is no archive, or has no library to lay out, stays where
-  // it is. None when that is done, else why it cannot be.
+  // Lays out the package at `file`. What is no archive, keeps its libraries, or has none to lay
+  // out, stays where it is. None when that is done, else why it cannot be.
   std::optional<std::string> LayOut(const std::string& file, InstalledAbi abi,
                                     const Deadline& deadline);
 

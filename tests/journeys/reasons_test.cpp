@@ -353,6 +353,7 @@ TEST_F(Reason, LibrariesThatThePackageKeeps) {
                    "      Nothing: it is loaded from the package.",
                    "  – lib/x86_64/libvault.so  nothing to sign: no phone of this kind installs it",
                    "-> 0"}));
+  EXPECT_EQ(Told(3, {"--install=all"})[2], "  – lib/arm64/libvault.so   " + kept);
 }
 
 TEST_F(Reason, Jar) {

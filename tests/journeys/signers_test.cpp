@@ -78,9 +78,9 @@ TEST(KernelsDigest, IsThatOfTheModulusAlone) {
   EXPECT_EQ(LineWith(Told("apksigner-sha256-2048"), "modulus SHA-256") + "\n",
             "    modulus SHA-256 digest: " + modulus.output.substr(0, 64) +
                 " (of the modulus alone: what the kernel gets)\n");
-  EXPECT_EQ(LineWith(Told("apksigner-newer-only", {"--verbose"}), "modulus SHA-256") + "\n",
-            "    modulus SHA-256 digest: " + modulus.output.substr(0, 64) +
-                " (of the modulus alone)\n");
+  EXPECT_EQ(
+      LineWith(Told("apksigner-newer-only", {"--verbose"}), "modulus SHA-256") + "\n",
+      "    modulus SHA-256 digest: " + modulus.output.substr(0, 64) + " (of the modulus alone)\n");
 }
 
 TEST(Doubtful, GoodPackageHasNothing) {

@@ -7,6 +7,7 @@
 #include <algorithm>
 #include <filesystem>
 
+#include "support/compiled_manifest.h"
 #include "support/files.h"
 #include "support/package.h"
 
@@ -17,11 +18,11 @@ namespace fs = std::filesystem;
 const Deadline kLater(1e6);
 
 // "path content" of each file that is laid out beside the package.
-std::vector<std::string> LaidOut(const std::vector<ZipItem>& libraries, InstalledAbi abi,
-                                 std::vector<std::string>* left_out = nullptr) {
+std::vector<std::string> LaidOutOf(const PackageOptions& package, InstalledAbi abi,
+                                   std::vector<std::string>* left_out = nullptr) {
   const TempDir folder;
   const std::string file = folder / "base.apk";
-  MakePackage(WithLibraries(libraries)).WriteTo(file);
+  MakePackage(package).WriteTo(file);
   Installation installation;
   EXPECT_EQ(installation.LayOut(file, abi, kLater), std::nullopt);
   if (left_out != nullptr) *left_out = installation.left_out();
@@ -36,6 +37,12 @@ std::vector<std::string> LaidOut(const std::vector<ZipItem>& libraries, Installe
   }
   std::sort(files.begin(), files.end());
   return files;
+}
+
+// The same, of a package with these libraries.
+std::vector<std::string> LaidOut(const std::vector<ZipItem>& libraries, InstalledAbi abi,
+                                 std::vector<std::string>* left_out = nullptr) {
+  return LaidOutOf(WithLibraries(libraries), abi, left_out);
 }
 
 using Files = std::vector<std::string>;
@@ -64,6 +71,21 @@ TEST(Installation, WithoutLibrariesToLayOutThePackageStaysWhereItIs) {
   EXPECT_EQ(LaidOut({kBoth[3]}, InstalledAbi::kPhone), Files());
   EXPECT_EQ(LaidOut({kBoth[0]}, InstalledAbi::kArm), Files());
   EXPECT_EQ(LaidOut({}, InstalledAbi::kAll), Files());
+}
+
+TEST(Installation, PackageThatKeepsItsLibrariesStaysWhereItIs) {
+  PackageOptions package = WithLibraries(kBoth);
+  const auto laid_out = [&package](bool extracts) {
+    constexpr uint8_t kBoolean = 0x12;
+    XmlAttribute attribute = IntAttribute("extractNativeLibs", extracts ? 0xffffffff : 0);
+    attribute.type = kBoolean;
+    CompiledXml xml;
+    xml.Start("manifest").Element("application", {InAndroidNamespace(attribute)}).End("manifest");
+    package.android_manifest = xml.Build();
+    return LaidOutOf(package, InstalledAbi::kPhone);
+  };
+  EXPECT_EQ(laid_out(true), Files({"lib/arm64/liba.so 64"}));
+  EXPECT_EQ(laid_out(false), Files());
 }
 
 TEST(Installation, NamesDoNotLeadOutOfTheirFolder) {
