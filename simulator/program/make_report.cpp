@@ -53,7 +53,9 @@ Report MakeReport(const Events& events, const PackageFacts& facts, const Circums
   DescribeSigners(facts, &report);
   report.warnings = FindWarnings(facts, own, around.not_laid_out);
   report.protection = FindProtection(facts, report.items);
-  if (own.kind == ItemKind::kPackage) report.chain = MakeChain(facts, own);
+  if (own.kind == ItemKind::kPackage) {
+    report.chain = MakeChain(facts, report.items, report.protection.verified);
+  }
   return report;
 }
 

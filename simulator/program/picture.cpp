@@ -11,6 +11,7 @@ enum { kKey, kCertificate, kSignatureFile, kManifest, kEntries, kLinkCount };
 int BreakOf(const Cause* why);
 std::string KeyText(const PackageFacts& facts);
 bool WasVerified(const Item& library);
+bool IsOtherThanSigned(const Item& item);
 
 }  // namespace
 
@@ -40,7 +41,8 @@ Protection FindProtection(const PackageFacts& facts, const std::vector<Item>& it
   return protection;
 }
 
-std::vector<Link> MakeChain(const PackageFacts& facts, const Item& own) {
+std::vector<Link> MakeChain(const PackageFacts& facts, const std::vector<Item>& items,
+                            const Share& verified) {
   const JarSignatureFacts& jar = facts.jar;
   std::vector<Link> chain = {
       {"key", LinkState::kHolds, KeyText(facts)},
@@ -48,15 +50,20 @@ std::vector<Link> MakeChain(const PackageFacts& facts, const Item& own) {
       {"signature file", LinkState::kHolds,
        jar.signature_files.empty() ? "" : jar.signature_files[0]},
       {"manifest", LinkState::kHolds, jar.has_manifest ? "META-INF/MANIFEST.MF" : ""},
-      {"entries", LinkState::kHolds, "classes.dex and the native libraries"}};
-  const int broken = BreakOf(own.reason.cause);
+      {"entries", LinkState::kHolds,
+       std::to_string(verified.entries) + " compared with the manifest"}};
+  const int broken = BreakOf(items[0].reason.cause);
   for (int i = 0; i < kLinkCount; ++i) {
     Link& link = chain[static_cast<size_t>(i)];
     if (i > broken) link.state = LinkState::kNotReached;
     if (i == broken) {
       link.state = LinkState::kBroken;
-      link.text = own.reason.Text();
+      link.text = items[0].reason.Text();
     }
+  }
+  const auto other = std::find_if(items.begin(), items.end(), IsOtherThanSigned);
+  if (broken == kLinkCount && other != items.end()) {
+    chain[kEntries] = {"entries", LinkState::kBroken, other->name + ": " + other->reason.Text()};
   }
   return chain;
 }
@@ -104,6 +111,13 @@ bool WasVerified(const Item& library) {
   return library.state == ItemState::kDone || why == &cause::kKernelRefused ||
          why == &cause::kIntegrityZero || why == &cause::kIntegrityMissing ||
          why == &cause::kIntegrityUnreadable || why == &cause::kLibraryNotOpened;
+}
+
+// A library that does not match the manifest.
+bool IsOtherThanSigned(const Item& item) {
+  const Cause* const why = item.reason.cause;
+  return why == &cause::kLibraryChanged || why == &cause::kLibraryNotListed ||
+         why == &cause::kLibraryDigest;
 }
 
 }  // namespace

@@ -9,5 +9,8 @@
 // `items` are the report's: an entry is verified when what was checked against its digest was good.
 Protection FindProtection(const PackageFacts& facts, const std::vector<Item>& items);
 
-// Key, certificate, signature file, manifest, entries; `own` is the package's own item.
-std::vector<Link> MakeChain(const PackageFacts& facts, const Item& own);
+// Key, certificate, signature file, manifest, entries. It breaks where the package itself was
+// refused, else where a library is not the one that was signed; `verified` are the entries whose
+// digests were good. The first item is the package's own.
+std::vector<Link> MakeChain(const PackageFacts& facts, const std::vector<Item>& items,
+                            const Share& verified);

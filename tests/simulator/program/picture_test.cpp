@@ -40,7 +40,7 @@ uint64_t Verified(const Cause* package, const Cause* library) {
 // "h" for a link that holds, "x" for the broken one, "-" for one that was not reached.
 std::string ChainOf(const Cause* why) {
   std::string text;
-  for (const Link& link : MakeChain(Package(), PackageItem(why))) {
+  for (const Link& link : MakeChain(Package(), {PackageItem(why)}, {})) {
     text += "hx-"[static_cast<size_t>(link.state)];
   }
   return text;
@@ -80,9 +80,24 @@ TEST(Chain, BreaksWhereTheCauseIs) {
 }
 
 TEST(Chain, SaysWhatStandsThereOrWhyItBreaks) {
-  const std::vector<Link> chain = MakeChain(Package(), PackageItem(&cause::kManifestChanged));
+  const std::vector<Link> chain = MakeChain(Package(), {PackageItem(&cause::kManifestChanged)}, {});
   EXPECT_EQ(chain[0].text, "RSA-2048");
   EXPECT_EQ(chain[1].text, "CN=a");
   EXPECT_EQ(chain[2].text, "META-INF/CERT.SF");
   EXPECT_EQ(chain[3].text, "META-INF/MANIFEST.MF was changed after it was signed");
+}
+
+TEST(Chain, EndsWithWhatWasComparedOrTheLibraryThatIsAnother) {
+  const auto end = [](const Cause* package, const Cause* library) {
+    return MakeChain(Package(), {PackageItem(package), LibraryItem(library)}, {2, 11})[4];
+  };
+  EXPECT_EQ(end(nullptr, nullptr).text, "2 compared with the manifest");
+  EXPECT_EQ(end(nullptr, &cause::kKernelRefused).state, LinkState::kHolds);
+  EXPECT_EQ(end(nullptr, &cause::kLibraryMissing).state, LinkState::kHolds);
+  for (const Cause* why :
+       {&cause::kLibraryChanged, &cause::kLibraryNotListed, &cause::kLibraryDigest}) {
+    EXPECT_EQ(end(nullptr, why).state, LinkState::kBroken);
+    EXPECT_EQ(end(nullptr, why).text, std::string("lib/arm64/a.so: ") + why->reason);
+  }
+  EXPECT_EQ(end(&cause::kManifestChanged, &cause::kPackageRefused).state, LinkState::kNotReached);
 }
