@@ -60,12 +60,19 @@ int Complain(int status, const std::string& message) {
   return status;
 }
 
+// The status, if all that was printed could be written.
+int EndWith(int status) {
+  std::cout.flush();
+  if (std::cout) return status;
+  return Complain(std::max(status, kCannotSimulate), "cannot write to standard output");
+}
+
 }  // namespace
 
 int main(int argc, char** argv) {
   const bool has_standard_input = KeepStandardStreams();
   Options options;
-  if (const auto status = ParseOptions(argc, argv, &options)) return *status;
+  if (const auto status = ParseOptions(argc, argv, &options)) return EndWith(*status);
   Simulator simulator(options, has_standard_input);
   Presenter presenter(options);
   if (const auto objection = presenter.Objection()) return Complain(kUsageError, *objection);
@@ -145,11 +152,7 @@ void Presenter::WritePage() {
   if (page_file_.IsWanted() && !page_file_.Append(page_.Html())) FailToWrite(page_file_);
 }
 
-int Presenter::Finish() const {
-  std::cout.flush();
-  if (std::cout) return status_;
-  return Complain(std::max(status_, kCannotSimulate), "cannot write to standard output");
-}
+int Presenter::Finish() const { return EndWith(status_); }
 
 // The journal goes to its file, and to standard output when that is asked for.
 void Presenter::Keep(const std::string& journal) {

@@ -56,7 +56,7 @@ struct Share {
 
 struct Protection {
   Share verified;   // dex and libraries, whose digests were compared with the manifest
-  Share vouched;    // in the manifest, and not compared
+  Share vouched;    // in the manifest, and not compared or not the same
   Share unlisted;   // not in the manifest
   Share signature;  // the manifest, signature files and blocks
   std::vector<std::string> unlisted_names;

@@ -57,6 +57,6 @@ std::string Joined(const std::vector<std::string>& schemes);
 
 // The words for a share of the package, and for a number with its noun: "1 entry", "2 entries".
 inline constexpr char kVerifiedWord[] = "verified";
-inline constexpr char kVouchedWord[] = "listed and not checked";
+inline constexpr char kVouchedWord[] = "listed and not verified";
 inline constexpr char kUnlistedWord[] = "not listed";
 std::string Counted(uint64_t count, const char* one, const char* many);

@@ -23,7 +23,7 @@ std::vector<BarPart> MakeShareBar(const Protection& protection, uint64_t file_si
   std::vector<BarPart> parts = {
       {"verified", kVerifiedWord, "dex and native libraries, compared with the manifest", true,
        protection.verified, 0, 0, 0},
-      {"vouched", kVouchedWord, "the manifest has a digest of them, and nothing was compared", true,
+      {"vouched", kVouchedWord, "the manifest has a digest, which nothing was found to match", true,
        protection.vouched, 0, 0, 0},
       {"unlisted", kUnlistedWord, "no digest in the manifest: anyone may have changed them", true,
        protection.unlisted, 0, 0, 0},

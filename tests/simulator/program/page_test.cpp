@@ -200,7 +200,7 @@ TEST(Page, LeavesOutWhatThereIsNot) {
 TEST(Page, DrawsEachPartOfThePackage) {
   const std::string page = PageOf(HostileReport("x"));
   EXPECT_TRUE(Has(page,
-                  "verified 30.0 %, listed and not checked 20.0 %, not listed 10.0 %, the "
+                  "verified 30.0 %, listed and not verified 20.0 %, not listed 10.0 %, the "
                   "signature itself 5.0 %, between the entries 35.0 %</desc>"));
   EXPECT_EQ(Count(page, "<rect fill=\"url(#unlisted)\" x="), 1U);
   EXPECT_TRUE(Has(page,

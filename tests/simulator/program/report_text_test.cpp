@@ -103,7 +103,7 @@ TEST(ReportText, SignerStandsAsApksignerPrintsIt) {
                 " (of the modulus alone: what the kernel gets)\n"
                 "    schemes: v1, v2\n"
                 "    protects: 2 entries (100 bytes) verified, 0 entries (0 bytes) listed and not "
-                "checked, 1 entry (1 byte) not listed\n");
+                "verified, 1 entry (1 byte) not listed\n");
 }
 
 TEST(ReportText, QuietIsTheVerdictAlone) {

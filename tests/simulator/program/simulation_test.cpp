@@ -135,9 +135,12 @@ TEST(ExitStatus, ThreeWhenTheToolIsAnotherProgramThatDoesNothing) {
 TEST(ExitStatus, ThreeWhenStandardOutputIsFullOrClosed) {
   const Probe probe({"sign 3 0100ab"});
   for (const char* script : {"exec \"$@\" >/dev/full", "exec \"$@\" >&-"}) {
-    const ProcessResult result = InShell(script, {probe.path()});
-    EXPECT_EQ(result.status, 3) << script;
-    EXPECT_EQ(result.errors, "apktoolkit-sim: cannot write to standard output\n");
+    for (const std::string& word :
+         {probe.path(), std::string("--help"), std::string("--version")}) {
+      const ProcessResult result = InShell(script, {word});
+      EXPECT_EQ(result.status, 3) << script << word;
+      EXPECT_EQ(result.errors, "apktoolkit-sim: cannot write to standard output\n");
+    }
   }
 }
 
