@@ -110,17 +110,7 @@ bool PackageModel::Judge(const Archive& archive) {
 
   const ManifestModel signed_text =
       ReadManifest(std::string(signature_file.begin(), signature_file.end()));
-  const std::string suffix = "-Digest-Manifest";
-  std::optional<bool> manifest_is_good;
-  for (const auto& section : signed_text.sections) {
-    if (manifest_is_good) break;
-    for (const auto& [attribute, value] : section) {
-      if (!EndsIn(attribute, suffix)) continue;
-      manifest_is_good = IsDigest(attribute.substr(0, attribute.size() - suffix.size()),
-                                  ReadBase64(value).value_or(Bytes()), *manifest);
-    }
-  }
-  if (!signed_text.valid || !manifest_is_good.value_or(false)) return false;
+  if (!signed_text.valid || !StatesDigestOf(*manifest, signed_text)) return false;
 
   const ManifestModel text = ReadManifest(std::string(manifest->begin(), manifest->end()));
   if (!text.valid) return false;
@@ -140,6 +130,20 @@ bool PackageModel::Judge(const Archive& archive) {
   if (found == 0) return true;
   const std::optional<Bytes> content = archive.Extract("classes.dex");
   return content && IsListed("classes.dex", *content);
+}
+
+bool PackageModel::StatesDigestOf(const Bytes& manifest, const ManifestModel& signature_file) {
+  const std::string suffix = "-Digest-Manifest";
+  std::optional<bool> is_good;
+  for (const auto& section : signature_file.sections) {
+    if (is_good) break;
+    for (const auto& [attribute, value] : section) {
+      if (!EndsIn(attribute, suffix)) continue;
+      is_good = IsDigest(attribute.substr(0, attribute.size() - suffix.size()),
+                         ReadBase64(value).value_or(Bytes()), manifest);
+    }
+  }
+  return is_good.value_or(false);
 }
 
 bool PackageModel::AllowsLibrary(const std::string& directory, const std::string& path,

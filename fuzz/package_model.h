@@ -9,6 +9,8 @@
 
 #include "support/der.h"
 
+struct ManifestModel;
+
 class PackageModel {
  public:
   explicit PackageModel(const Bytes& archive);
@@ -32,6 +34,9 @@ class PackageModel {
 
   bool Judge(const Archive& archive);
   bool IsListed(const std::string& name, const Bytes& content) const;
+  // Whether the first section of the signature file that has a digest has that of the manifest; of
+  // several in the section the last counts.
+  static bool StatesDigestOf(const Bytes& manifest, const ManifestModel& signature_file);
   static bool IsDigest(const std::string& attribute, const Bytes& digest, const Bytes& content);
 
   bool is_package_ = false;

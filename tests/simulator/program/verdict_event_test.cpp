@@ -4,7 +4,10 @@
 
 #include "simulator/phone/probe_run.h"
 
-TEST(VerdictEvent, HoldsTheWholeReport) {
+namespace {
+
+// A report with something of everything.
+Report WholeReport() {
   Report report;
   report.file = "base.apk";
   report.path = "/data/app/od\xe9\".apk";
@@ -39,7 +42,13 @@ TEST(VerdictEvent, HoldsTheWholeReport) {
   report.protection.verified = {1, 2};
   report.chain = {{"key", LinkState::kHolds, "RSA-2048"}, {"entries", LinkState::kBroken, "x"}};
 
-  const Json event = ParseJournal(VerdictEvent(report)).at(0);
+  return report;
+}
+
+}  // namespace
+
+TEST(VerdictEvent, HoldsTheWholeReport) {
+  const Json event = ParseJournal(VerdictEvent(WholeReport())).at(0);
   EXPECT_EQ(event["event"], "verdict");
   EXPECT_EQ(event["file"], "base.apk");
   EXPECT_EQ(event["path"], "/data/app/od\uf7e9\".apk");

@@ -1,0 +1,36 @@
+// Running apktoolkit-sim with the probe as the tool.
+#pragma once
+
+#include <algorithm>
+
+#include "simulator/phone/probe_run.h"
+#include "support/process.h"
+#include "support/simulation.h"
+
+// Runs apktoolkit-sim for somebody who reads UTF-8.
+inline ProcessResult Told(const Lines& words) {
+  Lines command = {"env", "LC_ALL=C.UTF-8", SimulatorPath()};
+  command.insert(command.end(), words.begin(), words.end());
+  return RunProcess(command);
+}
+
+// The same with the probe as the tool.
+inline ProcessResult Simulated(Lines words) {
+  words.insert(words.begin(), {"--tool", PROBE_PATH});
+  return Told(words);
+}
+
+// The first lines of what is printed.
+inline Lines FirstLines(const ProcessResult& result, size_t count) {
+  Lines lines = LinesOf(result.output);
+  lines.resize(std::min(lines.size(), count));
+  return lines;
+}
+
+// What the shell makes of a command line: `script`, in which "$@" is the simulator with the probe
+// as its tool.
+inline ProcessResult InShell(const std::string& script, const Lines& words) {
+  Lines command = {"bash", "-c", script, "bash", SimulatorPath(), "--tool", PROBE_PATH};
+  command.insert(command.end(), words.begin(), words.end());
+  return RunProcess(command);
+}
