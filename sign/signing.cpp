@@ -8,6 +8,7 @@
 #include <string>
 #include <vector>
 
+#include "apk/native_libraries.h"
 #include "sign/integrity.h"
 #include "util/digest.h"
 #include "util/file.h"
@@ -20,7 +21,6 @@ uint32_t VeltSignOat(ApkTools::Apk& apk, int fd);
 uint32_t SignAsPackage(ApkTools::Apk& apk, int fd);
 uint32_t SignAsJar(ApkTools::Apk& apk, int fd);
 std::vector<uint8_t> SignPayload(const std::vector<uint8_t>& data);
-std::string InstalledLibraryPath(const std::string& package_path, const std::string& entry_name);
 void SignLibrary(ApkTools::Apk& apk, const std::string& entry_name, const std::string& target);
 void ReportNotVerified(const std::string& target);
 
@@ -49,7 +49,7 @@ uint32_t VeltSignJni(ApkTools::Apk& apk, int fd, const char* /*path*/) {
   ZipEntry entry;
   std::string name;
   while (apk.Next(cookie, &entry, name) == 0) {
-    const std::string target = InstalledLibraryPath(apk.GetPath(), name);
+    const std::string target = ApkTools::InstalledLibraryPath(apk.GetPath(), name);
     if (!target.empty()) SignLibrary(apk, name, target);
   }
   apk.EndIteration(cookie);
@@ -109,37 +109,6 @@ std::vector<uint8_t> SignPayload(const std::vector<uint8_t>& data) {
   memcpy(payload.data(), &length, sizeof(length));
   std::copy(data.begin(), data.end(), payload.begin() + sizeof(length));
   return payload;
-}
-
-struct LibraryDirectory {
-  const char* entry_prefix;  // of the names in the archive
-  const char* installed;     // where the installer puts those libraries, beside the package
-};
-
-// The first row whose prefix matches wins, so the longer names come before "lib/armeabi", which is
-// a prefix of two of them.
-// Deliberate: "lib/armeabi-v8a" is in no usual list of ABIs; a package that has it means 64-bit
-// Arm.
-constexpr LibraryDirectory kLibraryDirectories[] = {
-    {"lib/armeabi-v7a", "lib/arm"},
-    {"lib/armeabi-v8a", "lib/arm64"},
-    {"lib/arm64-v8a", "lib/arm64"},
-    {"lib/armeabi", "lib/arm"},
-};
-
-// Where the library `entry_name` of the package lies on disk; empty when its ABI is none of ours.
-std::string InstalledLibraryPath(const std::string& package_path, const std::string& entry_name) {
-  for (const LibraryDirectory& row : kLibraryDirectories) {
-    const size_t prefix_length = strlen(row.entry_prefix);
-    // Deliberate: plain prefixes. No "/" has to follow, so "lib/armeabiX/a.so" is looked for in
-    // "lib/armX/"; the digest check that follows decides all the same.
-    if (entry_name.compare(0, prefix_length, row.entry_prefix) != 0) continue;
-    const size_t slash = package_path.rfind('/');
-    const std::string directory =
-        slash == std::string::npos ? "" : package_path.substr(0, slash + 1);
-    return directory + row.installed + entry_name.substr(prefix_length);
-  }
-  return {};
 }
 
 void SignLibrary(ApkTools::Apk& apk, const std::string& entry_name, const std::string& target) {
