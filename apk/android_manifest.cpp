@@ -4,7 +4,6 @@
 #include <androidfw/ResourceTypes.h>
 #include <utils/String8.h>
 
-#include <algorithm>
 #include <cstring>
 #include <set>
 #include <string_view>
@@ -32,14 +31,14 @@ uint16_t FirstUnit(Text text);
 
 }  // namespace
 
-bool Apk::ParseAndroidManifest(const std::vector<uint8_t>& bytes) {
-  // The parser reads the header of a chunk without asking whether there is room for one: that of
-  // the document, and where its last node should be.
-  constexpr size_t kHeaderSize = sizeof(android::ResChunk_header);
-  std::vector<uint8_t> document(bytes.size() + kHeaderSize);
-  std::copy(bytes.begin(), bytes.end(), document.begin());
+bool Apk::ParseAndroidManifest(std::vector<uint8_t> bytes) {
+  // The parser reads a header, or an attribute, without asking whether all of it is there, so there
+  // is room for one behind the document. Bytes with no room for a header are no document.
+  const size_t size = bytes.size(), room = size + sizeof(android::ResXMLTree_attribute);
+  bytes.reserve(room);
+  bytes.resize(room);
   android::ResXMLTree parser;
-  parser.setTo(document.data(), bytes.size() < kHeaderSize ? 0 : bytes.size(), false);
+  parser.setTo(bytes.data(), size < sizeof(android::ResChunk_header) ? 0 : size, false);
   if (const android::status_t error = parser.getError(); error != 0) {
     LogError("%s failed to init xml parser, error=0x%08x\n", "ParseAndroidManifest",
              static_cast<unsigned>(error));

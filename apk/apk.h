@@ -87,7 +87,7 @@ class Apk {
                   const std::vector<uint8_t>& data);
   // Reads the package name and the secure-storage permission from a compiled "AndroidManifest.xml".
   // False only when the bytes are no compiled XML at all; nothing changes then.
-  bool ParseAndroidManifest(const std::vector<uint8_t>& bytes);
+  bool ParseAndroidManifest(std::vector<uint8_t> bytes);
 
   // Whether the package verified, and its "classes.dex", if it has one, as well. The first call
   // checks that entry, later ones remember.
@@ -107,7 +107,7 @@ class Apk {
   bool FindFile(const char* path);
   bool OpenZip(bool own_fd);
   int32_t ExtractEntry(const std::string& name, std::vector<uint8_t>& out);
-  bool VerifyPackage(const std::vector<uint8_t>& android_manifest);
+  bool VerifyPackage(std::vector<uint8_t> android_manifest);
   bool ExtractSignatureFile(std::string& name, std::vector<uint8_t>& content);
   bool VerifyDex();
   template <typename ReadContent>

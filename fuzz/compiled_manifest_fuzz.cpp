@@ -74,7 +74,7 @@ void ReadElement(const ResXMLParser& parser, Facts* facts) {
 // False if the document is one that this reader, which looks at every attribute, is too slow for.
 bool ReadByConversion(std::vector<uint8_t> bytes, Facts* facts) {
   const size_t size = bytes.size();
-  bytes.resize(size + sizeof(android::ResChunk_header));
+  bytes.resize(size + sizeof(android::ResXMLTree_attribute));
   android::ResXMLTree parser;
   parser.setTo(bytes.data(), size, false);
   for (int event = parser.next(); event > ResXMLParser::END_DOCUMENT; event = parser.next()) {
@@ -90,7 +90,7 @@ bool ReadByConversion(std::vector<uint8_t> bytes, Facts* facts) {
 extern "C" int LLVMFuzzerTestOneInput(const uint8_t* data, size_t size) {
   ApkTools::Apk apk(-1);
   const std::vector<uint8_t> bytes(data, data + size);
-  PutNextBlockAtMemoryEnd(size + sizeof(android::ResChunk_header));
+  PutNextBlockAtMemoryEnd(size + sizeof(android::ResXMLTree_attribute));
   const bool parsed = apk.ParseAndroidManifest(bytes);
   Require(WasPutAtMemoryEnd(), "the document's block is as large as this target expects");
   if (!parsed) {

@@ -1,6 +1,6 @@
 // How often the platform's library is asked for the same, where its answers do not tell. The linker
-// sends the calls of the tool here (CMakeLists.txt names them as the compiler does) and they go on to
-// the library. A hostile document makes each call cost as much as it can.
+// sends the calls of the tool here (CMakeLists.txt names them as the compiler does) and they go on
+// to the library. A hostile document makes each call cost as much as it can.
 #include <androidfw/ResourceTypes.h>
 #include <gtest/gtest.h>
 #include <utils/String8.h>
