@@ -2,7 +2,6 @@
 
 #include <algorithm>
 #include <functional>
-#include <tuple>
 #include <utility>
 
 namespace ApkTools {
@@ -63,16 +62,18 @@ bool EntryDigests::Find(std::string_view name, std::string& digest_name,
 // By the hashes of the names, and by the names where those are equal: to compare names that lie all
 // over a text costs more than to read them once.
 void EntryDigests::Sort() {
-  std::vector<std::tuple<size_t, std::string_view, uint32_t>> named;
-  for (const uint32_t section : sections_) {
-    const std::string_view name = NameOf(section);
-    named.emplace_back(Hash(name), name, section);
-  }
-  std::sort(named.begin(), named.end());
-  sections_.clear();
-  for (const auto& [hash, name, section] : named) {
-    hashes_.push_back(hash);
-    sections_.push_back(section);
+  std::vector<std::pair<size_t, uint32_t>> hashed;
+  hashed.reserve(sections_.size());
+  for (const uint32_t section : sections_) hashed.emplace_back(Hash(NameOf(section)), section);
+  std::sort(hashed.begin(), hashed.end(), [this](const auto& a, const auto& b) {
+    if (a.first != b.first) return a.first < b.first;
+    const int order = NameOf(a.second).compare(NameOf(b.second));
+    return order != 0 ? order < 0 : a.second < b.second;
+  });
+  hashes_.reserve(hashed.size());
+  for (size_t i = 0; i < hashed.size(); ++i) {
+    hashes_.push_back(hashed[i].first);
+    sections_[i] = hashed[i].second;
   }
 }
 
