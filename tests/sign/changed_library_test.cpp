@@ -1,5 +1,5 @@
-// A library that is touched, exchanged or written to while the tool works on it. The changes come at
-// exact moments: before an open, after it, before and after a read, before the kernel signs.
+// A library that is touched, exchanged or written to while the tool works on it. The changes come
+// at exact moments: before an open, after it, before and after a read, before the kernel signs.
 #include <gtest/gtest.h>
 #include <sys/stat.h>
 
@@ -108,7 +108,8 @@ class ChangedLibrary : public testing::Test {
 
 TEST_F(ChangedLibrary, LeftAloneIsSignedAfterOneDigest) { ExpectSigned(1); }
 
-// --- Touched, and its bytes as they were. A test for each way of an installer's to finish its work.
+// --- Touched, and its bytes as they were. A test for each way of an installer's to finish its
+// work.
 
 class TouchedLibrary : public ChangedLibrary, public testing::WithParamInterface<const char*> {
  protected:
@@ -238,7 +239,9 @@ TEST_F(ChangedLibrary, WrittenToAfterItsSecondDigestIsRefused) {
 
 TEST_F(ChangedLibrary, WrittenToAfterItsThirdDigestIsRefused) {
   before_second_open_ = [this] { Rename("good"); };
-  after_digest_[2] = [this] { UntilNoticed([this] { EXPECT_EQ(chmod(target_.c_str(), 0600), 0); }); };
+  after_digest_[2] = [this] {
+    UntilNoticed([this] { EXPECT_EQ(chmod(target_.c_str(), 0600), 0); });
+  };
   after_digest_[3] = [this] { WriteInPlace(); };
   ExpectRefused(3);
 }

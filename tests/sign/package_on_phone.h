@@ -29,11 +29,15 @@ inline std::string PackagePayload() {
   return "2000" + Hex(digest, sizeof(digest));
 }
 
-inline std::string SignEvent(int fd) { return "sign " + std::to_string(fd) + " " + PackagePayload(); }
+inline std::string SignEvent(int fd) {
+  return "sign " + std::to_string(fd) + " " + PackagePayload();
+}
 
 inline ZipItem Library(const std::string& name) { return {name, ToBytes("\177ELF " + name)}; }
 
-inline LogRecord Starts(int fd) { return Info("VeltSignJni starts: " + std::to_string(fd) + ".\n"); }
+inline LogRecord Starts(int fd) {
+  return Info("VeltSignJni starts: " + std::to_string(fd) + ".\n");
+}
 inline LogRecord Finished() { return Info("VeltSignJni finished: 0.\n"); }
 
 // A package in a directory of its own, opened as the driver does, with the log and the phone ready.
