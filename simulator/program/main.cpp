@@ -3,6 +3,9 @@
 
 #include <algorithm>
 #include <iostream>
+#include <optional>
+#include <utility>
+#include <vector>
 
 #include "simulator/phone/journal.h"
 #include "simulator/program/options.h"
@@ -80,10 +83,12 @@ int main(int argc, char** argv) {
   if (!simulator.Prepare(&error)) return Complain(kCannotSimulate, error);
   if (!presenter.Begin()) return kCannotSimulate;
   CatchInterruptions();
+  const std::vector<std::string>& files = options.files;
+  std::vector<std::optional<Outcome>> outcomes(files.size());
   RunInOrder(
-      options.files, options.jobs, [&](const std::string& file) { return simulator.Run(file); },
-      [&](const Outcome& outcome) { presenter.Show(outcome); },
-      [&](const std::string& file, int seconds) { presenter.ShowProgress(file, seconds); });
+      files.size(), options.jobs, [&](size_t i) { outcomes[i] = simulator.Run(files[i]); },
+      [&](size_t i) { presenter.Show(*std::exchange(outcomes[i], std::nullopt)); },
+      [&](size_t i, int seconds) { presenter.ShowProgress(files[i], seconds); });
   presenter.ShowSummary();
   presenter.WritePage();
   EndIfInterrupted();

@@ -4,65 +4,60 @@
 #include <chrono>
 #include <condition_variable>
 #include <mutex>
-#include <optional>
 #include <thread>
+#include <vector>
 
 #include "simulator/program/process.h"
 
 namespace {
 
-// What the threads share. Outcomes are taken out as soon as they are told of.
+// What the threads share.
 struct Shared {
   std::mutex mutex;
   std::condition_variable finished;
-  size_t next = 0;  // the file that nobody has taken yet
-  std::vector<std::optional<Outcome>> outcomes;
+  size_t next = 0;  // the number that nobody has taken yet
+  std::vector<bool> has_run;
 };
 
-void Work(const std::vector<std::string>& files,
-          const std::function<Outcome(const std::string& file)>& run, Shared* shared) {
+void Work(const std::function<void(size_t number)>& run, Shared* shared) {
   while (!IsInterrupted()) {
     size_t mine = 0;
     {
       const std::lock_guard<std::mutex> lock(shared->mutex);
-      if (shared->next == files.size()) return;
+      if (shared->next == shared->has_run.size()) return;
       mine = shared->next++;
     }
-    Outcome outcome = run(files[mine]);
+    run(mine);
     const std::lock_guard<std::mutex> lock(shared->mutex);
-    shared->outcomes[mine] = std::move(outcome);
+    shared->has_run[mine] = true;
     shared->finished.notify_all();
   }
 }
 
 }  // namespace
 
-void RunInOrder(const std::vector<std::string>& files, unsigned jobs,
-                const std::function<Outcome(const std::string& file)>& run,
-                const std::function<void(const Outcome& outcome)>& done,
-                const std::function<void(const std::string& file, int seconds)>& waiting) {
+void RunInOrder(size_t count, unsigned jobs, const std::function<void(size_t number)>& run,
+                const std::function<void(size_t number)>& done,
+                const std::function<void(size_t number, int seconds)>& waiting) {
   using Clock = std::chrono::steady_clock;
   constexpr auto kNowAndThen = std::chrono::milliseconds(200);
   Shared shared;
-  shared.outcomes.resize(files.size());
+  shared.has_run.resize(count);
   std::vector<std::thread> threads;
-  for (size_t i = 0; i < std::min<size_t>(jobs, files.size()); ++i) {
-    threads.emplace_back(Work, std::cref(files), std::cref(run), &shared);
+  for (size_t i = 0; i < std::min<size_t>(jobs, count); ++i) {
+    threads.emplace_back(Work, std::cref(run), &shared);
   }
-  for (size_t i = 0; i < files.size() && !IsInterrupted(); ++i) {
+  for (size_t i = 0; i < count && !IsInterrupted(); ++i) {
     const auto start = Clock::now();
     std::unique_lock<std::mutex> lock(shared.mutex);
-    while (!shared.outcomes[i] && !IsInterrupted()) {
+    while (!shared.has_run[i] && !IsInterrupted()) {
       shared.finished.wait_for(lock, kNowAndThen);
       const auto passed = std::chrono::duration_cast<std::chrono::seconds>(Clock::now() - start);
-      if (!shared.outcomes[i] && passed.count() > 0) {
-        waiting(files[i], static_cast<int>(passed.count()));
-      }
+      if (!shared.has_run[i] && passed.count() > 0) waiting(i, static_cast<int>(passed.count()));
     }
-    if (!shared.outcomes[i]) break;
-    const Outcome outcome = *std::exchange(shared.outcomes[i], std::nullopt);
+    if (!shared.has_run[i]) break;
     lock.unlock();
-    done(outcome);
+    done(i);
   }
   for (std::thread& thread : threads) thread.join();
 }
