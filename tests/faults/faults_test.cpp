@@ -12,8 +12,8 @@
 
 #include "simulator/phone/settings.h"
 #include "simulator/phone/text.h"
-#include "simulator/program/events.h"
-#include "simulator/program/run.h"
+#include "simulator/run/events.h"
+#include "simulator/run/tool_process.h"
 #include "support/expected_timeline.h"
 #include "support/files.h"
 #include "support/package.h"
