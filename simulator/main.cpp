@@ -11,15 +11,30 @@
 #include "simulator/phone/journal.h"
 #include "simulator/run/process.h"
 #include "simulator/run/queue.h"
+#include "simulator/run/simulator.h"
 #include "simulator/show/output_file.h"
 #include "simulator/show/page.h"
 #include "simulator/show/report_words.h"
-#include "simulator/simulator.h"
+#include "simulator/show/verdict_event.h"
+#include "simulator/verdict/make_report.h"
+
+namespace simulator {
 
 namespace {
 
 constexpr OutputKind kJournal = {"--journal", "journal", "{\"event\":\"journal\""};
 constexpr OutputKind kPage = {"--html", "page", kPageStart};
+
+// What came of one file.
+struct Outcome {
+  Report report;
+  std::string journal;  // the lines of its run, from "start" to "verdict"
+};
+
+Outcome Judged(const FileRun& run, const JudgeOptions& options) {
+  const Report report = MakeReport(run.record, run.facts, options);
+  return {report, run.journal + VerdictEvent(report)};
+}
 
 // Tells of each file in the ways that were asked for.
 class Presenter {
@@ -72,11 +87,14 @@ int EndWith(int status) {
 
 }  // namespace
 
+}  // namespace simulator
+
 int main(int argc, char** argv) {
+  using namespace simulator;
   const bool has_standard_input = KeepStandardStreams();
   Options options;
   if (const auto status = ParseOptions(argc, argv, &options)) return EndWith(*status);
-  Simulator simulator(options, has_standard_input);
+  Simulator simulator(options.run, has_standard_input);
   Presenter presenter(options);
   if (const auto objection = presenter.Objection()) return Complain(kUsageError, *objection);
   std::string error;
@@ -86,7 +104,8 @@ int main(int argc, char** argv) {
   const std::vector<std::string>& files = options.files;
   std::vector<std::optional<Outcome>> outcomes(files.size());
   RunInOrder(
-      files.size(), options.jobs, [&](size_t i) { outcomes[i] = simulator.Run(files[i]); },
+      files.size(), options.run.jobs,
+      [&](size_t i) { outcomes[i] = Judged(simulator.Run(files[i]), options.judge); },
       [&](size_t i) { presenter.Show(*std::exchange(outcomes[i], std::nullopt)); },
       [&](size_t i, int seconds) { presenter.ShowProgress(files[i], seconds); });
   presenter.ShowSummary();
@@ -95,12 +114,14 @@ int main(int argc, char** argv) {
   return presenter.Finish();
 }
 
+namespace simulator {
+
 namespace {
 
 std::optional<std::string> Presenter::Objection() const {
   std::vector<std::string> inputs = options_.files;
-  inputs.insert(inputs.end(), options_.trust.begin(), options_.trust.end());
-  inputs.push_back(options_.tool);
+  inputs.insert(inputs.end(), options_.run.trust.begin(), options_.run.trust.end());
+  inputs.push_back(options_.run.tool);
   if (journal_.IsSameAs(page_file_)) return "--journal and --html name the same file";
   if (auto objection = journal_.Objection(inputs)) return objection;
   return page_file_.Objection(inputs);
@@ -170,3 +191,5 @@ void Presenter::FailToWrite(const OutputFile& file) {
 }
 
 }  // namespace
+
+}  // namespace simulator

@@ -8,6 +8,8 @@
 #include "simulator/phone/text.h"
 #include "simulator/run/tool_process.h"
 
+namespace simulator {
+
 namespace {
 
 constexpr char kDescription[] =
@@ -27,7 +29,7 @@ constexpr char kInstall[] = "--install";
 constexpr struct {
   const char* name;
   InstalledAbi abi;
-} kAbis[] = {{"phone", InstalledAbi::kPhone},
+} kAbis[] = {{"phone", InstalledAbi::kPreferred},
              {"all", InstalledAbi::kAll},
              {"arm64", InstalledAbi::kArm64},
              {"arm", InstalledAbi::kArm}};
@@ -51,7 +53,7 @@ std::optional<int> ParseOptions(int argc, char** argv, Options* options) {
   app.footer(kFooter);
   app.get_formatter()->column_width(28);
   app.allow_extras();  // so that they can be named
-  options->tool = ProgramDirectory() + "/apktoolkit";
+  options->run.tool = ProgramDirectory() + "/apktoolkit";
   std::string runner;
 
   app.add_option("FILE", options->files, "Packages, JARs or other files")
@@ -74,7 +76,7 @@ std::optional<int> ParseOptions(int argc, char** argv, Options* options) {
     return app.exit(error) == 0 ? 0 : kUsageError;
   }
   for (const std::string& word : Split(runner, ' ')) {
-    if (!word.empty()) options->runner.push_back(word);
+    if (!word.empty()) options->run.runner.push_back(word);
   }
   return NameUnknownOption(app);
 }
@@ -93,7 +95,7 @@ std::vector<std::string> WordsOf(int argc, char** argv) {
 }
 
 void AddPhone(CLI::App* app, Options* options) {
-  PhoneSettings* const phone = &options->phone;
+  PhoneSettings* const phone = &options->run.phone;
   app->add_option_function<std::string>(
          "--integrity", [phone](const std::string& text) { phone->integrity = Split(text, ','); },
          "What the tool reads as its integrity value;\n"
@@ -110,12 +112,12 @@ void AddPhone(CLI::App* app, Options* options) {
   app->add_option("--zu-result", phone->zu_result, "What libzu answers [default: 0]")
       ->type_name("N")
       ->group(kThePhone);
-  app->add_option("--trust", options->trust, "The kernel trusts this file; may be repeated")
+  app->add_option("--trust", options->run.trust, "The kernel trusts this file; may be repeated")
       ->check(CLI::ExistingFile.description(""))
       ->type_name("FILE")
       ->allow_extra_args(false)
       ->group(kThePhone);
-  app->add_option("--state", options->state,
+  app->add_option("--state", options->run.state,
                   "Remember in DIR what was signed, and trust it\n"
                   "while its bytes stay the same")
       ->type_name("DIR")
@@ -136,7 +138,7 @@ void AddKernelAnswer(CLI::App* app, const char* name, int* error, const char* de
 void AddInstallation(CLI::App* app, Options* options) {
   const auto install = [options](const std::string& name) {
     for (const auto& abi : kAbis) {
-      if (name == abi.name) options->abi = abi.abi;
+      if (name == abi.name) options->run.abi = abi.abi;
     }
   };
   const auto check = [](const std::string& name) {
@@ -151,7 +153,7 @@ void AddInstallation(CLI::App* app, Options* options) {
       ->type_name("[=ABI]")
       ->check(check)
       ->group(kTheRun);
-  app->add_flag("--strict", options->is_strict,
+  app->add_flag("--strict", options->judge.is_strict,
                 "A library that does not lie beside its package\n"
                 "counts as refused")
       ->group(kTheRun);
@@ -182,17 +184,17 @@ void AddOutput(CLI::App* app, Options* options) {
 }
 
 void AddRun(CLI::App* app, Options* options, std::string* runner) {
-  app->add_option("--jobs", options->jobs, "Look at so many files at a time [default: 1]")
+  app->add_option("--jobs", options->run.jobs, "Look at so many files at a time [default: 1]")
       ->type_name("N")
       ->check(CLI::Range(1, 1024).description(""))
       ->group(kTheRun);
-  app->add_option("--timeout", options->timeout,
+  app->add_option("--timeout", options->run.timeout,
                   "Give up a file that takes longer\n"
                   "[default: 30]")
       ->type_name("SECONDS")
       ->check(CLI::Range(0.001, 1e6).description(""))
       ->group(kTheRun);
-  app->add_option("--tool", options->tool,
+  app->add_option("--tool", options->run.tool,
                   "The program to run [default: the apktoolkit\n"
                   "beside this program]")
       ->type_name("PATH")
@@ -227,3 +229,5 @@ int ErrorNumber(const std::string& name) {
 }
 
 }  // namespace
+
+}  // namespace simulator

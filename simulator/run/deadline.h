@@ -3,6 +3,8 @@
 
 #include <chrono>
 
+namespace simulator {
+
 class Deadline {
  public:
   explicit Deadline(double seconds) : end_(Clock::now() + Seconds(seconds)) {}
@@ -15,3 +17,5 @@ class Deadline {
 
   std::chrono::time_point<Clock, Seconds> end_;
 };
+
+}  // namespace simulator

@@ -4,6 +4,8 @@
 
 #include "simulator/phone/text.h"
 
+namespace simulator {
+
 Events ParseEvents(const std::string& journal) {
   Events events;
   for (const std::string& line : Split(journal, '\n')) {
@@ -28,3 +30,5 @@ std::string DescribeErrno(int64_t error) {
   if (name == nullptr) return "error " + std::to_string(error);
   return std::string(name) + ": " + strerrordesc_np(static_cast<int>(error));
 }
+
+}  // namespace simulator

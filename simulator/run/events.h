@@ -6,6 +6,8 @@
 #include <string>
 #include <vector>
 
+namespace simulator {
+
 using Events = std::vector<nlohmann::json>;
 
 // The events of a journal's lines. Lines that are no JSON are not ours and do not count.
@@ -18,3 +20,5 @@ int64_t NumberOf(const nlohmann::json& event, const char* key);
 
 // Such as "ENOKEY: Required key not available".
 std::string DescribeErrno(int64_t error);
+
+}  // namespace simulator

@@ -14,6 +14,8 @@
 #include "simulator/package/archive.h"
 #include "simulator/package/facts.h"
 
+namespace simulator {
+
 namespace {
 
 namespace fs = std::filesystem;
@@ -144,7 +146,7 @@ bool Wants(InstalledAbi choice, const std::string& folder, bool has_arm64) {
       return folder == kArm64;
     case InstalledAbi::kArm:
       return folder == kArm;
-    case InstalledAbi::kPhone:
+    case InstalledAbi::kPreferred:
       return folder == kArm64 || !has_arm64;
   }
   return false;
@@ -192,3 +194,5 @@ bool WriteAll(int fd, std::string_view bytes) {
 std::string FileName(const std::string& path) { return path.substr(path.rfind('/') + 1); }
 
 }  // namespace
+
+}  // namespace simulator

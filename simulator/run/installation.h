@@ -8,9 +8,11 @@
 
 #include "simulator/run/deadline.h"
 
+namespace simulator {
+
 // Whose libraries are laid out.
 enum class InstalledAbi {
-  kPhone,  // of 64-bit Arm, where the package has any; else of 32-bit Arm
+  kPreferred,  // of 64-bit Arm, where the package has any; else of 32-bit Arm
   kAll,
   kArm64,
   kArm,
@@ -38,3 +40,5 @@ class Installation {
   std::string path_;
   std::vector<std::string> left_out_;
 };
+
+}  // namespace simulator

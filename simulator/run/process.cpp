@@ -6,6 +6,8 @@
 
 #include <initializer_list>
 
+namespace simulator {
+
 namespace {
 
 volatile sig_atomic_t caught = 0;
@@ -41,3 +43,5 @@ void EndIfInterrupted() {
   signal(caught, SIG_DFL);
   raise(caught);
 }
+
+}  // namespace simulator

@@ -1,6 +1,8 @@
 // What this process was started with, and how it is asked to end.
 #pragma once
 
+namespace simulator {
+
 // Sees to it that no file of this program's gets the place of a standard stream that was closed.
 // Whether there was a standard input; programs that are started from here find it as it was.
 bool KeepStandardStreams();
@@ -11,3 +13,5 @@ void CatchInterruptions();
 bool IsInterrupted();
 // Ends the process by the signal that came, if one came.
 void EndIfInterrupted();
+
+}  // namespace simulator

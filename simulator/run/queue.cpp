@@ -9,6 +9,8 @@
 
 #include "simulator/run/process.h"
 
+namespace simulator {
+
 namespace {
 
 // What the threads share.
@@ -61,3 +63,5 @@ void RunInOrder(size_t count, unsigned jobs, const std::function<void(size_t num
   }
   for (std::thread& thread : threads) thread.join();
 }
+
+}  // namespace simulator

@@ -4,6 +4,8 @@
 #include <cstddef>
 #include <functional>
 
+namespace simulator {
+
 // Calls `run` for each number below `count`, in `jobs` threads, and in this one `done` for each, in
 // order, as soon as its turn has come. While one takes longer than a second, `waiting` is called
 // now and then with its number and the seconds. Ends early when the process is interrupted; `done`
@@ -11,3 +13,5 @@
 void RunInOrder(size_t count, unsigned jobs, const std::function<void(size_t number)>& run,
                 const std::function<void(size_t number)>& done,
                 const std::function<void(size_t number, int seconds)>& waiting);
+
+}  // namespace simulator

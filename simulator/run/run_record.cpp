@@ -5,6 +5,8 @@
 
 #include "sign/libzu.h"
 
+namespace simulator {
+
 namespace {
 
 using nlohmann::json;
@@ -46,7 +48,9 @@ class Reader {
 RunRecord TakeApart(const Events& events) {
   Reader reader;
   for (const json& event : events) reader.Read(event);
-  return reader.Finish();
+  RunRecord record = reader.Finish();
+  record.events = events;
+  return record;
 }
 
 std::optional<std::string> Between(const std::string& line, const std::string& before,
@@ -226,3 +230,5 @@ void Reader::CloseAttempt() {
 }
 
 }  // namespace
+
+}  // namespace simulator

@@ -1,5 +1,6 @@
 // A run of the tool, taken apart: which error belongs to which file. Made from the journal's events
-// and nothing else; texts of the tool's log are known here, and only here.
+// and nothing else, but for what stands last in the record; texts of the tool's log are known here,
+// and only here.
 #pragma once
 
 #include <cstdint>
@@ -8,6 +9,8 @@
 #include <vector>
 
 #include "simulator/run/events.h"
+
+namespace simulator {
 
 // One file that the tool took up, to have it signed.
 struct Attempt {
@@ -28,7 +31,23 @@ struct Attempt {
   std::vector<std::string> errors;       // what was logged before, of this file
 };
 
+// Why a run tells nothing of the file.
+struct Failure {
+  enum class Kind {
+    kNone,
+    kNotStarted,
+    kTimedOut,
+    kStandInsMissing,
+    kStateNotKept,
+    kNotInstalled,
+  };
+
+  Kind kind = Kind::kNone;
+  std::string detail;
+};
+
 struct RunRecord {
+  Events events;  // all that happened, in order
   std::string file;
   std::string path;
   bool is_silent = true;  // the tool neither said nor did anything
@@ -52,6 +71,11 @@ struct RunRecord {
   std::vector<std::string> other_errors;  // that belong to nothing of the above
   std::optional<int64_t> signal;          // that the tool was killed by
   int64_t status = 0;
+
+  // What the simulator itself knows of the run.
+  Failure failure;
+  bool has_standard_input = true;         // the tool was started with one
+  std::vector<std::string> not_laid_out;  // the files that --install left out
 };
 
 RunRecord TakeApart(const Events& events);
@@ -60,3 +84,5 @@ RunRecord TakeApart(const Events& events);
 // stands for all the rest.
 std::optional<std::string> Between(const std::string& line, const std::string& before,
                                    const std::string& after);
+
+}  // namespace simulator

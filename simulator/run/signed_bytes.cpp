@@ -10,6 +10,8 @@
 
 #include "simulator/package/certificate.h"
 
+namespace simulator {
+
 namespace {
 
 namespace fs = std::filesystem;
@@ -91,3 +93,5 @@ bool SignedBytes::IsSame(Seen* seen, const std::string& path, const struct stat&
   if (seen->digest.empty() && is_as_it_was) seen->digest = DigestOf(seen->path, deadline);
   return !seen->digest.empty() && seen->digest == DigestOf(path, deadline);
 }
+
+}  // namespace simulator

@@ -15,6 +15,8 @@
 
 #include "simulator/run/deadline.h"
 
+namespace simulator {
+
 class SignedBytes {
  public:
   // `directory` is made when it is not there; empty: nothing is kept beyond this object. Where
@@ -48,3 +50,5 @@ class SignedBytes {
   std::set<std::string> digests_;  // lower-case hexadecimal
   std::vector<Seen> seen_;
 };
+
+}  // namespace simulator

@@ -13,28 +13,30 @@
 
 #include "simulator/run/process.h"
 
+namespace simulator {
+
 namespace {
 
 using Words = std::vector<std::string>;
 
-Words WordsOf(const Command& command, Words* environment);
+Words WordsOf(const ToolCommand& command, Words* environment);
 Words EnvironmentWith(const Words& assignments);
 int Spawn(Words words, Words environment, pid_t* child);
-Ending Wait(pid_t child, const Deadline& deadline);
+ToolEnd Wait(pid_t child, const Deadline& deadline);
 std::vector<char*> Pointers(Words* words);
 
 }  // namespace
 
-Ending Run(const Command& command, const Deadline& deadline) {
+ToolEnd RunTool(const ToolCommand& command, const Deadline& deadline) {
   Words environment = command.environment;
   const Words words = WordsOf(command, &environment);
   pid_t child = 0;
   const int error = Spawn(words, EnvironmentWith(environment), &child);
-  if (error != 0) return {End::kNotStarted, error};
+  if (error != 0) return {ToolEnd::How::kNotStarted, error};
   return Wait(child, deadline);
 }
 
-const std::string& ProgramOf(const Command& command) {
+const std::string& ProgramOf(const ToolCommand& command) {
   return command.runner.empty() ? command.tool : command.runner[0];
 }
 
@@ -49,7 +51,7 @@ namespace {
 
 // The stand-in is loaded into the tool alone: a runner hands the variable on, and has not got it
 // itself.
-Words WordsOf(const Command& command, Words* environment) {
+Words WordsOf(const ToolCommand& command, Words* environment) {
   const std::string preload = "LD_PRELOAD=" + command.kernel;
   Words words = command.runner;
   if (words.empty()) {
@@ -95,7 +97,7 @@ std::vector<char*> Pointers(Words* words) {
   return pointers;
 }
 
-Ending Wait(pid_t child, const Deadline& deadline) {
+ToolEnd Wait(pid_t child, const Deadline& deadline) {
   int status = 0;
   bool timed_out = false;
   while (waitpid(child, &status, WNOHANG) == 0) {
@@ -108,9 +110,11 @@ Ending Wait(pid_t child, const Deadline& deadline) {
       break;
     }
   }
-  if (timed_out) return {End::kTimedOut, 0};
-  return WIFEXITED(status) ? Ending{End::kExited, WEXITSTATUS(status)}
-                           : Ending{End::kKilled, WTERMSIG(status)};
+  if (timed_out) return {ToolEnd::How::kTimedOut, 0};
+  return WIFEXITED(status) ? ToolEnd{ToolEnd::How::kExited, WEXITSTATUS(status)}
+                           : ToolEnd{ToolEnd::How::kKilled, WTERMSIG(status)};
 }
 
 }  // namespace
+
+}  // namespace simulator

@@ -6,7 +6,9 @@
 
 #include "simulator/run/deadline.h"
 
-struct Command {
+namespace simulator {
+
+struct ToolCommand {
   std::vector<std::string> runner;  // words before the tool, such as an emulator's; mostly none
   std::string tool;
   std::string file;                      // the tool's one argument
@@ -14,21 +16,23 @@ struct Command {
   std::vector<std::string> environment;  // NAME=VALUE, over what this process has
 };
 
-enum class End { kExited, kKilled, kTimedOut, kNotStarted };
+struct ToolEnd {
+  enum class How { kExited, kKilled, kTimedOut, kNotStarted };
 
-struct Ending {
-  End end;
+  How how;
   int value;  // kExited: the status. kKilled: the signal. kNotStarted: the errno. Otherwise 0.
 };
 
 // Runs the command to its end. Its standard output goes nowhere, since the journal has it; its
 // standard input and error are this process's. When the time is up, or this process is to end, the
 // tool is killed.
-Ending Run(const Command& command, const Deadline& deadline);
+ToolEnd RunTool(const ToolCommand& command, const Deadline& deadline);
 
 // The program that is started: the runner, or else the tool.
-const std::string& ProgramOf(const Command& command);
+const std::string& ProgramOf(const ToolCommand& command);
 
 // The directory that this program lies in, without a closing "/". The tool lies beside it, and the
 // stand-ins in ../lib/apktoolkit, in the build tree as where it is installed.
 std::string ProgramDirectory();
+
+}  // namespace simulator

@@ -9,6 +9,8 @@
 #include <filesystem>
 #include <fstream>
 
+namespace simulator {
+
 namespace {
 
 namespace fs = std::filesystem;
@@ -74,3 +76,5 @@ std::string OutputFile::ErrorText() const {
   return std::string("cannot write the ") + kind_.name + " " + path_ + ": " +
          strerrordesc_np(errno);
 }
+
+}  // namespace simulator

@@ -7,6 +7,8 @@
 #include <string_view>
 #include <vector>
 
+namespace simulator {
+
 struct OutputKind {
   const char* option;      // that names the file
   const char* name;        // such as "journal"
@@ -41,3 +43,5 @@ class OutputFile {
   const std::string path_;
   int fd_ = -1;
 };
+
+}  // namespace simulator

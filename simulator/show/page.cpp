@@ -10,6 +10,8 @@
 #include "simulator/show/terminal.h"
 #include "simulator/show/timeline.h"
 
+namespace simulator {
+
 namespace {
 
 using kainjow::mustache::data;
@@ -280,3 +282,5 @@ const char* CodeOf(Mood mood) {
 }
 
 }  // namespace
+
+}  // namespace simulator

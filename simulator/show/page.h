@@ -11,6 +11,8 @@
 
 #include "simulator/verdict/report.h"
 
+namespace simulator {
+
 // What each page begins with.
 inline constexpr std::string_view kPageStart =
     "<!DOCTYPE html>\n<!-- A page of apktoolkit-sim -->\n";
@@ -32,3 +34,5 @@ class Page {
   kainjow::mustache::list files_;  // what the template shows of each
   std::vector<Verdict> verdicts_;
 };
+
+}  // namespace simulator

@@ -4,6 +4,8 @@
 
 #include "simulator/show/report_words.h"
 
+namespace simulator {
+
 namespace {
 
 // Entries may overlap and claim more bytes than the file has; then nothing lies between them.
@@ -51,3 +53,5 @@ std::vector<BarPart> MakeShareBar(const Protection& protection, uint64_t file_si
   }
   return parts;
 }
+
+}  // namespace simulator

@@ -6,6 +6,8 @@
 
 #include "simulator/verdict/report.h"
 
+namespace simulator {
+
 struct BarPart {
   const char* code;     // of its look
   const char* name;     // in the legend
@@ -20,3 +22,5 @@ struct BarPart {
 // From what the signature protects best to what lies between the entries. Empty when the file has
 // no entries.
 std::vector<BarPart> MakeShareBar(const Protection& protection, uint64_t file_size);
+
+}  // namespace simulator

@@ -5,6 +5,8 @@
 #include "simulator/show/report_words.h"
 #include "simulator/show/timeline.h"
 
+namespace simulator {
+
 namespace {
 
 constexpr size_t kWidth = 80;  // what to do is wrapped to it
@@ -174,3 +176,5 @@ std::string ShareText(const Share& share) {
 }
 
 }  // namespace
+
+}  // namespace simulator

@@ -7,6 +7,10 @@
 #include "simulator/show/terminal.h"
 #include "simulator/verdict/report.h"
 
+namespace simulator {
+
 enum class Detail { kVerdict, kUsual, kAll };
 
 void PrintReport(const Report& report, Detail detail, const Look& look, std::ostream& out);
+
+}  // namespace simulator

@@ -2,6 +2,8 @@
 
 #include <algorithm>
 
+namespace simulator {
+
 namespace {
 
 // Such as "RSA-2048".
@@ -133,3 +135,5 @@ std::vector<std::pair<std::string, std::string>> CertificateRows(
   }
   return rows;
 }
+
+}  // namespace simulator

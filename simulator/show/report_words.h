@@ -9,6 +9,8 @@
 #include "simulator/verdict/report.h"
 #include "simulator/verdict/wording.h"
 
+namespace simulator {
+
 // What a verdict means to the one who reads it.
 enum class Mood { kGood, kMixed, kBad };
 
@@ -57,3 +59,5 @@ std::vector<std::pair<std::string, std::string>> CertificateRows(
 inline constexpr char kVerifiedWord[] = "verified";
 inline constexpr char kVouchedWord[] = "listed and not verified";
 inline constexpr char kUnlistedWord[] = "not listed";
+
+}  // namespace simulator

@@ -11,6 +11,8 @@
 
 #include "simulator/phone/text.h"
 
+namespace simulator {
+
 namespace {
 
 bool IsShown(std::string_view character, const Look& look) {
@@ -72,3 +74,5 @@ size_t Columns(std::string_view text) {
   for (const char c : text) columns += (static_cast<uint8_t>(c) & 0xc0U) != 0x80 ? 1 : 0;
   return columns;
 }
+
+}  // namespace simulator

@@ -4,6 +4,8 @@
 #include <string>
 #include <string_view>
 
+namespace simulator {
+
 // How the one who reads sees it.
 struct Look {
   bool has_colours = false;
@@ -27,3 +29,5 @@ std::string Coloured(const std::string& text, Colour colour, const Look& look);
 
 // How many columns a printable text takes, each character counting as one.
 size_t Columns(std::string_view text);
+
+}  // namespace simulator

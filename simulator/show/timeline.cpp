@@ -6,6 +6,8 @@
 
 #include "sign/libzu.h"
 
+namespace simulator {
+
 namespace {
 
 using nlohmann::json;
@@ -141,3 +143,5 @@ void PrintLine(int number, const Line& line, const Look& look, std::ostream& out
 }
 
 }  // namespace
+
+}  // namespace simulator

@@ -8,6 +8,8 @@
 #include "simulator/run/events.h"
 #include "simulator/show/terminal.h"
 
+namespace simulator {
+
 // How one thing that happened reads; texts come as they are.
 struct TimelineLine {
   std::string what;  // such as "sign"
@@ -21,3 +23,5 @@ struct TimelineLine {
 std::vector<TimelineLine> MakeTimeline(const Events& events, const std::string& path);
 
 void PrintTimeline(const std::vector<TimelineLine>& lines, const Look& look, std::ostream& out);
+
+}  // namespace simulator

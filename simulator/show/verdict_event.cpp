@@ -6,6 +6,8 @@
 #include "simulator/phone/journal.h"
 #include "simulator/phone/text.h"
 
+namespace simulator {
+
 namespace {
 
 // Values as JSON: objects are lists of keys and values that are JSON already.
@@ -158,3 +160,5 @@ std::string VerdictEvent(const Report& report) {
   event.Json("chain", List(report.chain, LinkJson));
   return event.Line();
 }
+
+}  // namespace simulator

@@ -6,6 +6,8 @@
 // in a reason stands for what a single run fills in.
 #pragma once
 
+namespace simulator {
+
 struct Cause {
   const char* code;
   const char* reason;
@@ -274,3 +276,5 @@ inline constexpr Cause kNotLaidOut = {
     "An installer takes files of the form lib/ABI/NAME that can be extracted."};
 
 }  // namespace cause
+
+}  // namespace simulator

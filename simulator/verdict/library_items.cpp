@@ -5,6 +5,8 @@
 #include <cerrno>
 #include <cstdio>
 
+namespace simulator {
+
 namespace {
 
 // A library that the tool takes up, and what came of it; null when the tool did not say.
@@ -160,3 +162,5 @@ bool IsAbsent(const Reason& reason) {
 std::string FolderOf(const std::string& path) { return path.substr(0, path.rfind('/') + 1); }
 
 }  // namespace
+
+}  // namespace simulator

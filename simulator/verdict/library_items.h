@@ -7,6 +7,8 @@
 #include "simulator/run/run_record.h"
 #include "simulator/verdict/report.h"
 
+namespace simulator {
+
 // Adds an item for each library. `own` is the file's own item.
 void AddLibraryItems(const RunRecord& run, const PackageFacts& facts, const Item& own,
                      bool is_strict, std::vector<Item>* items);
@@ -17,3 +19,5 @@ Reason WhyKernelDidNotSign(const Attempt& attempt);
 // Where the installer puts the library of this entry, from the package's folder on, as the tool
 // looks for it; empty for one that no phone of this kind installs.
 std::string InstalledPlace(const std::string& entry);
+
+}  // namespace simulator

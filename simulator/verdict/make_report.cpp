@@ -3,17 +3,19 @@
 #include <algorithm>
 
 #include "sign/libzu.h"
-#include "simulator/run/run_record.h"
 #include "simulator/verdict/library_items.h"
 #include "simulator/verdict/package_reason.h"
 #include "simulator/verdict/protection.h"
 #include "simulator/verdict/warnings.h"
+
+namespace simulator {
 
 namespace {
 
 Item OwnItem(const RunRecord& run, const PackageFacts& facts);
 ItemKind KindOf(const RunRecord& run);
 Reason WhyJarRefused(const RunRecord& run);
+Reason WhyFailed(const Failure& failure);
 Reason WhyToolIsAnother(const RunRecord& run);
 void AddKeyItems(const RunRecord& run, std::vector<Item>* items);
 void AddToolItems(const RunRecord& run, const Item& own, std::vector<Item>* items);
@@ -23,21 +25,20 @@ Item Refused(ItemKind kind, const std::string& name, const Reason& reason);
 
 }  // namespace
 
-Report MakeReport(const Events& events, const PackageFacts& facts, const Circumstances& around) {
-  const RunRecord run = TakeApart(events);
+Report MakeReport(const RunRecord& run, const PackageFacts& facts, const JudgeOptions& options) {
   Report report;
   report.file = run.file;
   report.path = run.path;
-  report.events = events;
+  report.events = run.events;
   report.file_size = facts.size;
-  if (around.failure.cause != nullptr) {
+  if (run.failure.kind != Failure::Kind::kNone) {
     report.verdict = Verdict::kNotSimulated;
-    report.items = {Refused(ItemKind::kTool, "tool", around.failure)};
+    report.items = {Refused(ItemKind::kTool, "tool", WhyFailed(run.failure))};
     return report;
   }
   if (run.is_silent && !run.signal) {
     Reason reason;
-    if (run.status == 0) reason = WhyNotLookedAt(facts, around.has_standard_input);
+    if (run.status == 0) reason = WhyNotLookedAt(facts, run.has_standard_input);
     const bool is_known = reason.cause != nullptr;
     report.verdict = is_known ? Verdict::kNotLookedAt : Verdict::kNotSimulated;
     report.items = {is_known ? Refused(ItemKind::kFile, "file", reason)
@@ -46,12 +47,12 @@ Report MakeReport(const Events& events, const PackageFacts& facts, const Circums
   }
   const Item own = OwnItem(run, facts);
   report.items = {own};
-  AddLibraryItems(run, facts, own, around.is_strict, &report.items);
+  AddLibraryItems(run, facts, own, options.is_strict, &report.items);
   AddKeyItems(run, &report.items);
   AddToolItems(run, own, &report.items);
   report.verdict = Judge(report.items);
   DescribeSigners(facts, &report);
-  report.warnings = FindWarnings(facts, own, around.not_laid_out);
+  report.warnings = FindWarnings(facts, own, run.not_laid_out);
   report.protection = FindProtection(facts, report.items);
   if (own.kind == ItemKind::kPackage) {
     report.chain = MakeChain(facts, report.items, report.protection.verified);
@@ -124,6 +125,24 @@ Reason WhyJarRefused(const RunRecord& run) {
   return {&cause::kJarNotTrusted, DescribeErrno(run.verify_error.value_or(0))};
 }
 
+Reason WhyFailed(const Failure& failure) {
+  switch (failure.kind) {
+    case Failure::Kind::kNone:
+      break;
+    case Failure::Kind::kNotStarted:
+      return {&cause::kToolNotStarted, failure.detail};
+    case Failure::Kind::kTimedOut:
+      return {&cause::kToolTimedOut, failure.detail};
+    case Failure::Kind::kStandInsMissing:
+      return {&cause::kStandInsMissing, failure.detail};
+    case Failure::Kind::kStateNotKept:
+      return {&cause::kStateNotKept, failure.detail};
+    case Failure::Kind::kNotInstalled:
+      return {&cause::kNotInstalled, failure.detail};
+  }
+  return {};
+}
+
 // Of a run without a word: what ends with another status than 0 is not the tool either.
 Reason WhyToolIsAnother(const RunRecord& run) {
   if (run.status == 0) return {&cause::kToolSilent, ""};
@@ -190,3 +209,5 @@ void DescribeSigners(const PackageFacts& facts, Report* report) {
 }
 
 }  // namespace
+
+}  // namespace simulator

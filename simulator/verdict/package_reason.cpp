@@ -5,6 +5,8 @@
 
 #include "simulator/verdict/wording.h"
 
+namespace simulator {
+
 namespace {
 
 using Lines = std::vector<std::string>;
@@ -214,3 +216,5 @@ std::string FirstSignatureFile(const JarSignatureFacts& jar) {
 }
 
 }  // namespace
+
+}  // namespace simulator

@@ -6,6 +6,8 @@
 #include "simulator/run/run_record.h"
 #include "simulator/verdict/report.h"
 
+namespace simulator {
+
 // For a file that is neither signed nor a plain JAR.
 Reason WhyRefused(const RunRecord& run, const PackageFacts& facts);
 
@@ -16,3 +18,5 @@ Reason WhyNotLookedAt(const PackageFacts& facts, bool has_standard_input);
 // how the exponent is shown.
 bool IsForgeable(const PublicKey& key);
 std::string ExponentText(const PublicKey& key);
+
+}  // namespace simulator

@@ -4,6 +4,8 @@
 #include <set>
 #include <string>
 
+namespace simulator {
+
 namespace {
 
 enum { kKey, kCertificate, kSignatureFile, kManifest, kEntries, kLinkCount };
@@ -121,3 +123,5 @@ bool IsOtherThanSigned(const Item& item) {
 }
 
 }  // namespace
+
+}  // namespace simulator

@@ -6,6 +6,8 @@
 #include "simulator/package/facts.h"
 #include "simulator/verdict/report.h"
 
+namespace simulator {
+
 // `items` are the report's: an entry is verified when what was checked against its digest was good.
 Protection FindProtection(const PackageFacts& facts, const std::vector<Item>& items);
 
@@ -14,3 +16,5 @@ Protection FindProtection(const PackageFacts& facts, const std::vector<Item>& it
 // digests were good. The first item is the package's own.
 std::vector<Link> MakeChain(const PackageFacts& facts, const std::vector<Item>& items,
                             const Share& verified);
+
+}  // namespace simulator

@@ -12,6 +12,8 @@
 #include "simulator/run/events.h"
 #include "simulator/verdict/causes.h"
 
+namespace simulator {
+
 enum class Verdict {
   kSigned,
   kPartlySigned,
@@ -91,3 +93,5 @@ struct Report {
 
 // The exit status that a verdict stands for.
 int StatusOf(Verdict verdict);
+
+}  // namespace simulator

@@ -5,6 +5,8 @@
 #include "simulator/verdict/package_reason.h"
 #include "simulator/verdict/wording.h"
 
+namespace simulator {
+
 namespace {
 
 void WarnOfOtherKeys(const PackageFacts& facts, std::vector<Reason>* warnings);
@@ -90,3 +92,5 @@ void WarnOfUnlistedEntries(const PackageFacts& facts, std::vector<Reason>* warni
 }
 
 }  // namespace
+
+}  // namespace simulator

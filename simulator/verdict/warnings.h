@@ -7,6 +7,10 @@
 #include "simulator/package/facts.h"
 #include "simulator/verdict/report.h"
 
+namespace simulator {
+
 // `own` is the file's own item; what its reason says already is not said twice.
 std::vector<Reason> FindWarnings(const PackageFacts& facts, const Item& own,
                                  const std::vector<std::string>& not_laid_out);
+
+}  // namespace simulator

@@ -9,6 +9,8 @@
 #include "support/process.h"
 #include "support/simulation.h"
 
+using namespace simulator;
+
 namespace {
 
 // What the options are after this command line; it must be a good one.
@@ -34,41 +36,41 @@ ProcessResult Told(const Lines& words) {
 TEST(Options, DefaultIsAHealthyPhone) {
   const Options options = Parsed({"a.apk"});
   EXPECT_EQ(options.files, Lines({"a.apk"}));
-  EXPECT_EQ(options.phone.integrity, Lines({"1f"}));
-  EXPECT_EQ(options.phone.sign_errno, 0);
-  EXPECT_EQ(options.phone.verify_errno, ENOKEY);
-  EXPECT_EQ(options.phone.zu_result, 0);
-  EXPECT_EQ(options.trust, Lines());
-  EXPECT_EQ(options.state, "");
+  EXPECT_EQ(options.run.phone.integrity, Lines({"1f"}));
+  EXPECT_EQ(options.run.phone.sign_errno, 0);
+  EXPECT_EQ(options.run.phone.verify_errno, ENOKEY);
+  EXPECT_EQ(options.run.phone.zu_result, 0);
+  EXPECT_EQ(options.run.trust, Lines());
+  EXPECT_EQ(options.run.state, "");
   EXPECT_EQ(options.journal, "");
   EXPECT_EQ(options.html, "");
   EXPECT_FALSE(options.json);
-  EXPECT_EQ(options.tool, ProgramDirectory() + "/apktoolkit");
-  EXPECT_EQ(options.runner, Lines());
-  EXPECT_EQ(options.timeout, 30);
-  EXPECT_EQ(options.abi, std::nullopt);
-  EXPECT_FALSE(options.is_strict);
+  EXPECT_EQ(options.run.tool, ProgramDirectory() + "/apktoolkit");
+  EXPECT_EQ(options.run.runner, Lines());
+  EXPECT_EQ(options.run.timeout, 30);
+  EXPECT_EQ(options.run.abi, std::nullopt);
+  EXPECT_FALSE(options.judge.is_strict);
   EXPECT_EQ(options.detail, Detail::kUsual);
-  EXPECT_EQ(options.jobs, 1U);
+  EXPECT_EQ(options.run.jobs, 1U);
 }
 
 TEST(Options, EachChangesItsPartOfThePhone) {
   const Options options = Parsed({"--integrity", "ffffffff,missing,", "--sign-errno", "EPERM",
                                   "--verify-errno", "EBADMSG", "--zu-result", "-5", "a.apk"});
-  EXPECT_EQ(options.phone.integrity, Lines({"ffffffff", "missing", ""}));
-  EXPECT_EQ(options.phone.sign_errno, EPERM);
-  EXPECT_EQ(options.phone.verify_errno, EBADMSG);
-  EXPECT_EQ(options.phone.zu_result, -5);
+  EXPECT_EQ(options.run.phone.integrity, Lines({"ffffffff", "missing", ""}));
+  EXPECT_EQ(options.run.phone.sign_errno, EPERM);
+  EXPECT_EQ(options.run.phone.verify_errno, EBADMSG);
+  EXPECT_EQ(options.run.phone.zu_result, -5);
 }
 
 TEST(Options, ZuResultMayBeHexadecimal) {
-  EXPECT_EQ(Parsed({"--zu-result", "0x10004", "a.apk"}).phone.zu_result, 65540);
+  EXPECT_EQ(Parsed({"--zu-result", "0x10004", "a.apk"}).run.phone.zu_result, 65540);
 }
 
 TEST(Options, TrustTakesOneFileAtATime) {
   const Options options =
       Parsed({"--trust", "/dev/zero", "--trust", "/dev/null", "a.apk", "b.apk"});
-  EXPECT_EQ(options.trust, Lines({"/dev/zero", "/dev/null"}));
+  EXPECT_EQ(options.run.trust, Lines({"/dev/zero", "/dev/null"}));
   EXPECT_EQ(options.files, Lines({"a.apk", "b.apk"}));
 }
 
@@ -76,29 +78,29 @@ TEST(Options, TheRestIsTakenAsItIs) {
   const Options options =
       Parsed({"--state", "s", "--journal", "j", "--html", "h", "--json", "--tool", "t", "--timeout",
               "0.5", "--runner", "emulator  -L /root", "--", "-a.apk"});
-  EXPECT_EQ(options.state, "s");
+  EXPECT_EQ(options.run.state, "s");
   EXPECT_EQ(options.journal, "j");
   EXPECT_EQ(options.html, "h");
   EXPECT_TRUE(options.json);
-  EXPECT_EQ(options.tool, "t");
-  EXPECT_EQ(options.timeout, 0.5);
-  EXPECT_EQ(options.runner, Lines({"emulator", "-L", "/root"}));
+  EXPECT_EQ(options.run.tool, "t");
+  EXPECT_EQ(options.run.timeout, 0.5);
+  EXPECT_EQ(options.run.runner, Lines({"emulator", "-L", "/root"}));
   EXPECT_EQ(options.files, Lines({"-a.apk"}));
 }
 
 TEST(Options, WordsOfTheRunAreTakenAsTheyAre) {
   EXPECT_EQ(Parsed({"--quiet", "a.apk"}).detail, Detail::kVerdict);
   EXPECT_EQ(Parsed({"--verbose", "a.apk"}).detail, Detail::kAll);
-  EXPECT_TRUE(Parsed({"--strict", "a.apk"}).is_strict);
-  EXPECT_EQ(Parsed({"--jobs", "8", "a.apk"}).jobs, 8U);
+  EXPECT_TRUE(Parsed({"--strict", "a.apk"}).judge.is_strict);
+  EXPECT_EQ(Parsed({"--jobs", "8", "a.apk"}).run.jobs, 8U);
 }
 
 TEST(Options, InstallTakesItsValueAfterAnEqualsSignAlone) {
-  EXPECT_EQ(Parsed({"--install=all", "a.apk"}).abi, InstalledAbi::kAll);
-  EXPECT_EQ(Parsed({"--install=arm64", "a.apk"}).abi, InstalledAbi::kArm64);
-  EXPECT_EQ(Parsed({"--install=arm", "a.apk"}).abi, InstalledAbi::kArm);
+  EXPECT_EQ(Parsed({"--install=all", "a.apk"}).run.abi, InstalledAbi::kAll);
+  EXPECT_EQ(Parsed({"--install=arm64", "a.apk"}).run.abi, InstalledAbi::kArm64);
+  EXPECT_EQ(Parsed({"--install=arm", "a.apk"}).run.abi, InstalledAbi::kArm);
   const Options options = Parsed({"--install", "arm"});
-  EXPECT_EQ(options.abi, InstalledAbi::kPhone);
+  EXPECT_EQ(options.run.abi, InstalledAbi::kPreferred);
   EXPECT_EQ(options.files, Lines({"arm"}));
   EXPECT_EQ(Parsed({"--", "--install"}).files, Lines({"--install"}));
 }

@@ -11,6 +11,8 @@
 #include "support/files.h"
 #include "support/package.h"
 
+using namespace simulator;
+
 namespace {
 
 namespace fs = std::filesystem;
@@ -55,8 +57,8 @@ const std::vector<ZipItem> kBoth = {{"lib/arm64-v8a/liba.so", ToBytes("64")},
 }  // namespace
 
 TEST(Installation, OfAPhoneHasTheLibrariesOfItsOwnProcessor) {
-  EXPECT_EQ(LaidOut(kBoth, InstalledAbi::kPhone), Files({"lib/arm64/liba.so 64"}));
-  EXPECT_EQ(LaidOut({kBoth[1], kBoth[3]}, InstalledAbi::kPhone), Files({"lib/arm/liba.so 32"}));
+  EXPECT_EQ(LaidOut(kBoth, InstalledAbi::kPreferred), Files({"lib/arm64/liba.so 64"}));
+  EXPECT_EQ(LaidOut({kBoth[1], kBoth[3]}, InstalledAbi::kPreferred), Files({"lib/arm/liba.so 32"}));
 }
 
 TEST(Installation, TakesTheProcessorsThatAreAskedFor) {
@@ -68,7 +70,7 @@ TEST(Installation, TakesTheProcessorsThatAreAskedFor) {
 }
 
 TEST(Installation, WithoutLibrariesToLayOutThePackageStaysWhereItIs) {
-  EXPECT_EQ(LaidOut({kBoth[3]}, InstalledAbi::kPhone), Files());
+  EXPECT_EQ(LaidOut({kBoth[3]}, InstalledAbi::kPreferred), Files());
   EXPECT_EQ(LaidOut({kBoth[0]}, InstalledAbi::kArm), Files());
   EXPECT_EQ(LaidOut({}, InstalledAbi::kAll), Files());
 }
@@ -82,7 +84,7 @@ TEST(Installation, PackageThatKeepsItsLibrariesStaysWhereItIs) {
     CompiledXml xml;
     xml.Start("manifest").Element("application", {InAndroidNamespace(attribute)}).End("manifest");
     package.android_manifest = xml.Build();
-    return LaidOutOf(package, InstalledAbi::kPhone);
+    return LaidOutOf(package, InstalledAbi::kPreferred);
   };
   EXPECT_EQ(laid_out(true), Files({"lib/arm64/liba.so 64"}));
   EXPECT_EQ(laid_out(false), Files());
@@ -121,7 +123,7 @@ TEST(Installation, IsGoneWithItsOwner) {
   std::string path;
   {
     Installation installation;
-    ASSERT_EQ(installation.LayOut(file, InstalledAbi::kPhone, kLater), std::nullopt);
+    ASSERT_EQ(installation.LayOut(file, InstalledAbi::kPreferred, kLater), std::nullopt);
     path = installation.path();
     ASSERT_NE(path, file);
     EXPECT_TRUE(fs::exists(path));
@@ -140,11 +142,11 @@ TEST(Installation, OfAFileThatCannotBeLinkedIsACopyAndNotForEver) {
   ASSERT_EQ(write(memory, package.data(), package.size()), static_cast<ssize_t>(package.size()));
   const std::string file = "/proc/self/fd/" + std::to_string(memory);
   Installation copied;
-  EXPECT_EQ(copied.LayOut(file, InstalledAbi::kPhone, kLater), std::nullopt);
+  EXPECT_EQ(copied.LayOut(file, InstalledAbi::kPreferred, kLater), std::nullopt);
   EXPECT_NE(copied.path(), file);
   EXPECT_EQ(ContentOf(copied.path()), package);
   Installation late;
-  const auto problem = late.LayOut(file, InstalledAbi::kPhone, Deadline(0));
+  const auto problem = late.LayOut(file, InstalledAbi::kPreferred, Deadline(0));
   close(memory);
   ASSERT_TRUE(problem.has_value());
   EXPECT_NE(problem->find("Connection timed out"), std::string::npos) << *problem;
@@ -169,7 +171,7 @@ TEST(Installation, SaysWhenThereIsNoPlaceForIt) {
   const std::string kept = before == nullptr ? "/tmp" : before;
   ASSERT_EQ(setenv("TMPDIR", "/nowhere", 1), 0);
   Installation installation;
-  const auto problem = installation.LayOut(file, InstalledAbi::kPhone, kLater);
+  const auto problem = installation.LayOut(file, InstalledAbi::kPreferred, kLater);
   setenv("TMPDIR", kept.c_str(), 1);
   EXPECT_TRUE(problem.has_value());
 }

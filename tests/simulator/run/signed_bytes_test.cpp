@@ -7,6 +7,8 @@
 #include "simulator/phone/probe_run.h"
 #include "support/der.h"
 
+using namespace simulator;
+
 namespace {
 
 const Deadline kLater(1e6);

@@ -4,6 +4,8 @@
 #include "simulator/show/hostile_report.h"
 #include "simulator/show/page.h"
 
+using namespace simulator;
+
 int main() {
   Page page;
   page.Add(HostileReport(kHostileText));

@@ -6,6 +6,8 @@
 #include "simulator/phone/journal.h"
 #include "simulator/verdict/report.h"
 
+namespace simulator {
+
 // What such a file would bring: markup for every place of a page, what a terminal obeys, bytes that
 // are no UTF-8, characters that turn the direction of writing, and marks of the page's template.
 inline const char kHostileText[] =
@@ -61,3 +63,5 @@ inline Report HostileReport(const std::string& text) {
   report.events = HostileEvents(text);
   return report;
 }
+
+}  // namespace simulator

@@ -7,6 +7,8 @@
 
 #include "support/files.h"
 
+using namespace simulator;
+
 namespace {
 
 const OutputKind kList = {"--list", "list", "list:"};

@@ -8,6 +8,8 @@
 #include "simulator/show/hostile_report.h"
 #include "simulator/show/page_template.h"
 
+using namespace simulator;
+
 namespace {
 
 std::string PageOf(const std::vector<Report>& reports) {

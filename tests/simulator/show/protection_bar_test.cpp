@@ -4,6 +4,8 @@
 
 #include <cstdint>
 
+using namespace simulator;
+
 namespace {
 
 std::vector<double> Percents(const std::vector<BarPart>& parts) {

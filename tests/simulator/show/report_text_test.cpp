@@ -7,6 +7,8 @@
 #include "simulator/phone/probe_run.h"
 #include "simulator/show/hostile_report.h"
 
+using namespace simulator;
+
 namespace {
 
 const Look kUtf8 = {false, true};

@@ -2,6 +2,8 @@
 
 #include <gtest/gtest.h>
 
+using namespace simulator;
+
 namespace {
 
 Item Library(const Cause* why) {

@@ -2,6 +2,8 @@
 
 #include <gtest/gtest.h>
 
+using namespace simulator;
+
 namespace {
 
 const Look kUtf8 = {false, true};

@@ -6,6 +6,8 @@
 
 #include "simulator/phone/probe_run.h"
 
+using namespace simulator;
+
 namespace {
 
 // A journal's events as a timeline.

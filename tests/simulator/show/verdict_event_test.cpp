@@ -4,6 +4,8 @@
 
 #include "simulator/phone/probe_run.h"
 
+using namespace simulator;
+
 namespace {
 
 // A report with something of everything.

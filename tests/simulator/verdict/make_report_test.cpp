@@ -6,6 +6,8 @@
 
 #include "simulator/phone/probe_run.h"
 
+using namespace simulator;
+
 namespace {
 
 const std::string kFile = "/data/app/base.apk";
@@ -40,11 +42,15 @@ Json Register(int64_t result) {
           {"name", "com.app"},   {"data", "ab"}, {"result", result}};
 }
 
-Report Made(Events events, const PackageFacts& facts = {}, const Circumstances& around = {},
-            const Json& end = kExit) {
+RunRecord Record(Events events, const Json& end = kExit) {
   events.insert(events.begin(), kStart);
   events.push_back(end);
-  return MakeReport(events, facts, around);
+  return TakeApart(events);
+}
+
+Report Made(const Events& events, const PackageFacts& facts = {}, const JudgeOptions& options = {},
+            const Json& end = kExit) {
+  return MakeReport(Record(events, end), facts, options);
 }
 
 // "name state code detail", one line for each item.
@@ -161,9 +167,7 @@ TEST(MakeReport, LibraryThatIsNotThereIsNoRefusalUnlessTheUserIsStrict) {
                          Log(6, "VeltSignJni: File not verified: " + kLibrary + "\n"), kFileStart,
                          Sign(kFile, kPackagePayload)};
   EXPECT_EQ(Made(events).verdict, Verdict::kSigned);
-  Circumstances strict;
-  strict.is_strict = true;
-  const Report report = Made(events, {}, strict);
+  const Report report = Made(events, {}, {true});
   EXPECT_EQ(report.verdict, Verdict::kPartlySigned);
   EXPECT_EQ(ItemsOf(report)[1], "lib/arm64/libfoo.so refused library-not-installed");
 }
@@ -280,9 +284,9 @@ TEST(MakeReport, FileThatTheToolDidNotLookAt) {
     PackageFacts facts;
     facts.error = error;
     facts.is_read_only = is_read_only;
-    Circumstances around;
-    around.has_standard_input = has_standard_input;
-    const Report report = Made({}, facts, around);
+    RunRecord record = Record({});
+    record.has_standard_input = has_standard_input;
+    const Report report = MakeReport(record, facts, {});
     EXPECT_EQ(report.verdict, Verdict::kNotLookedAt);
     return ItemsOf(report)[0];
   };
@@ -306,9 +310,9 @@ TEST(MakeReport, ToolThatSaysNothingOfAFileThatItCouldOpenIsNotTheTool) {
 }
 
 TEST(MakeReport, FailureOfTheSimulationIsNoVerdictOnTheFile) {
-  Circumstances around;
-  around.failure = {&cause::kToolTimedOut, "2 seconds"};
-  const Report report = Made({Sign(kFile, kPackagePayload)}, {}, around);
+  RunRecord record = Record({Sign(kFile, kPackagePayload)});
+  record.failure = {Failure::Kind::kTimedOut, "2 seconds"};
+  const Report report = MakeReport(record, {}, {});
   EXPECT_EQ(report.verdict, Verdict::kNotSimulated);
   EXPECT_EQ(report.items[0].reason.Text(), "it was still busy after 2 seconds and was stopped");
 }
@@ -324,10 +328,10 @@ TEST(MakeReport, EachVerdictHasItsStatus) {
 }
 
 TEST(MakeReport, OddEventsAreNoHarm) {
-  const Report report = MakeReport({{{"event", 5}},
-                                    {{"event", "sign"}, {"path", 7}, {"result", "no"}},
-                                    {{"no", "event"}},
-                                    {{"event", "log"}, {"priority", "6"}}},
+  const Report report = MakeReport(TakeApart({{{"event", 5}},
+                                              {{"event", "sign"}, {"path", 7}, {"result", "no"}},
+                                              {{"no", "event"}},
+                                              {{"event", "log"}, {"priority", "6"}}}),
                                    {}, {});
   EXPECT_EQ(report.items.size(), 1U);
 }

@@ -2,6 +2,8 @@
 
 #include <gtest/gtest.h>
 
+using namespace simulator;
+
 namespace {
 
 // A package with a dex file, two libraries, a resource, an entry that is not listed, and its

@@ -1,4 +1,4 @@
-#include "simulator/simulator.h"
+#include "simulator/run/simulator.h"
 
 #include <fcntl.h>
 #include <signal.h>
@@ -14,7 +14,9 @@
 
 #include "simulator/phone/journal.h"
 #include "simulator/phone/text.h"
-#include "simulator/show/verdict_event.h"
+#include "simulator/run/tool_process.h"
+
+namespace simulator {
 
 namespace {
 
@@ -69,15 +71,15 @@ struct Simulator::Task {
   Task(const Task&) = delete;
   Task& operator=(const Task&) = delete;
 
-  void Fail(const Cause& why, const std::string& detail) { around.failure = {&why, detail}; }
+  void Fail(Failure::Kind kind, const std::string& detail) { failure = {kind, detail}; }
 
   const Deadline deadline;
   const int journal;
   std::string path;  // of the file that the tool is given, resolved
-  Circumstances around;
+  Failure failure;
 };
 
-Simulator::Simulator(const Options& options, bool has_standard_input)
+Simulator::Simulator(const RunOptions& options, bool has_standard_input)
     : options_(options),
       has_standard_input_(has_standard_input),
       kernel_(ProgramDirectory() + "/../lib/apktoolkit/libapktoolkit_kernel.so"),
@@ -96,57 +98,57 @@ bool Simulator::Prepare(std::string* error) {
   return signed_.Load() || Fail("cannot use the directory " + options_.state, error);
 }
 
-Outcome Simulator::Run(const std::string& file) {
+FileRun Simulator::Run(const std::string& file) {
   Task task((Deadline(options_.timeout)));
-  task.around.is_strict = options_.is_strict;
-  task.around.has_standard_input = has_standard_input_;
   Installation installation;
   std::string installed = file;
   if (options_.abi) {
     const auto problem = installation.LayOut(file, *options_.abi, task.deadline);
-    if (problem) task.Fail(cause::kNotInstalled, *problem);
-    if (problem && task.deadline.HasPassed()) task.Fail(cause::kToolTimedOut, SecondsText());
+    if (problem) task.Fail(Failure::Kind::kNotInstalled, *problem);
+    if (problem && task.deadline.HasPassed()) task.Fail(Failure::Kind::kTimedOut, SecondsText());
     installed = installation.path();
-    task.around.not_laid_out = installation.left_out();
   }
   task.path = Resolved(installed);
   Event("start").Text("file", file).Text("path", task.path).AppendTo(task.journal);
-  if (task.around.failure.cause == nullptr) RunTool(installed, &task);
+  if (task.failure.kind == Failure::Kind::kNone) RunToolFor(installed, &task);
 
-  Outcome outcome;
-  outcome.journal = ContentOf(task.journal);
-  const Events events = ParseEvents(outcome.journal);
-  RememberSigned(events, &task);
-  outcome.report = MakeReport(events, LookAt(installed), task.around);
-  outcome.journal += VerdictEvent(outcome.report);
-  return outcome;
+  FileRun run;
+  run.journal = ContentOf(task.journal);
+  run.record = TakeApart(ParseEvents(run.journal));
+  RememberSigned(run.record.events, &task);
+  run.record.failure = task.failure;
+  run.record.has_standard_input = has_standard_input_;
+  run.record.not_laid_out = installation.left_out();
+  run.facts = LookAt(installed);
+  return run;
 }
 
 // Runs the tool, and has the journal tell how it ended.
-void Simulator::RunTool(const std::string& file, Task* task) {
+void Simulator::RunToolFor(const std::string& file, Task* task) {
   const PhoneSettings phone = PhoneFor(*task);
-  if (task->deadline.HasPassed()) return task->Fail(cause::kToolTimedOut, SecondsText());
-  const Command command = {options_.runner, options_.tool, file, PreloadName(),
-                           SettingsToEnvironment(phone)};
-  const Ending ending = ::Run(command, task->deadline);
-  switch (ending.end) {
-    case End::kNotStarted:
-      errno = ending.value;
-      return task->Fail(cause::kToolNotStarted, "cannot start " + ProgramOf(command) + ErrnoText());
-    case End::kTimedOut:
+  if (task->deadline.HasPassed()) return task->Fail(Failure::Kind::kTimedOut, SecondsText());
+  const ToolCommand command = {options_.runner, options_.tool, file, PreloadName(),
+                               SettingsToEnvironment(phone)};
+  const ToolEnd end = RunTool(command, task->deadline);
+  switch (end.how) {
+    case ToolEnd::How::kNotStarted:
+      errno = end.value;
+      return task->Fail(Failure::Kind::kNotStarted,
+                        "cannot start " + ProgramOf(command) + ErrnoText());
+    case ToolEnd::How::kTimedOut:
       Event("exit").Number("signal", SIGKILL).AppendTo(task->journal);
-      return task->Fail(cause::kToolTimedOut, SecondsText());
-    case End::kKilled:
-      Event("exit").Number("signal", ending.value).AppendTo(task->journal);
+      return task->Fail(Failure::Kind::kTimedOut, SecondsText());
+    case ToolEnd::How::kKilled:
+      Event("exit").Number("signal", end.value).AppendTo(task->journal);
       break;
-    case End::kExited:
-      Event("exit").Number("status", ending.value).AppendTo(task->journal);
+    case ToolEnd::How::kExited:
+      Event("exit").Number("status", end.value).AppendTo(task->journal);
       break;
   }
   const Events events = ParseEvents(ContentOf(task->journal));
   const auto is_attached = [](const auto& event) { return TextOf(event, "event") == "attached"; };
   if (std::none_of(events.begin(), events.end(), is_attached)) {
-    task->Fail(cause::kStandInsMissing, options_.tool);
+    task->Fail(Failure::Kind::kStandInsMissing, options_.tool);
   }
 }
 
@@ -170,9 +172,9 @@ void Simulator::RememberSigned(const Events& events, Task* task) {
     const bool is_signed = TextOf(event, "event") == "sign" && NumberOf(event, "result") == 0;
     if (!is_signed || signed_.Add(TextOf(event, "path"), task->deadline)) continue;
     if (task->deadline.HasPassed()) {
-      task->Fail(cause::kToolTimedOut, SecondsText());
+      task->Fail(Failure::Kind::kTimedOut, SecondsText());
     } else {
-      task->Fail(cause::kStateNotKept, options_.state);
+      task->Fail(Failure::Kind::kStateNotKept, options_.state);
     }
     return;
   }
@@ -183,3 +185,5 @@ std::string Simulator::SecondsText() const {
   text << options_.timeout << (options_.timeout == 1 ? " second" : " seconds");
   return text.str();
 }
+
+}  // namespace simulator
