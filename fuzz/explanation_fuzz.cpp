@@ -18,6 +18,8 @@
 #include "simulator/package/signature_block.h"
 #include "simulator/package/signing_block.h"
 
+using namespace simulator;
+
 namespace {
 
 struct Free {

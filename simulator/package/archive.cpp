@@ -2,6 +2,8 @@
 
 #include <android/log.h>
 
+namespace simulator {
+
 namespace {
 
 void SilenceTheLibrary() {
@@ -62,3 +64,5 @@ bool Archive::Stream(const std::string& name,
   auto* const context = const_cast<std::function<bool(std::string_view)>*>(&take);
   return ProcessZipEntryContents(handle_, &entry, HandOver, context) == 0;
 }
+
+}  // namespace simulator

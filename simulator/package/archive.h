@@ -12,6 +12,8 @@
 #include <string_view>
 #include <vector>
 
+namespace simulator {
+
 struct ArchiveEntry {
   std::string name;  // any bytes
   uint64_t size;     // what its data takes in the archive
@@ -44,3 +46,5 @@ class Archive {
  private:
   ZipArchiveHandle handle_ = nullptr;
 };
+
+}  // namespace simulator

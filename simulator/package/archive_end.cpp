@@ -7,6 +7,8 @@
 
 #include "simulator/package/byte_reader.h"
 
+namespace simulator {
+
 namespace {
 
 constexpr char kSignature[] = "PK\5\6";
@@ -45,3 +47,5 @@ std::string ReadAt(int fd, uint64_t offset, size_t size) {
   bytes.resize(length);
   return bytes;
 }
+
+}  // namespace simulator

@@ -6,6 +6,8 @@
 #include <optional>
 #include <string>
 
+namespace simulator {
+
 struct ArchiveEnd {
   uint64_t
       directory_offset;  // of the central directory, as the record has it: maybe beyond the file
@@ -16,3 +18,5 @@ std::optional<ArchiveEnd> FindArchiveEnd(int fd);
 
 // `size` bytes of the file from `offset` on, or as many as there are.
 std::string ReadAt(int fd, uint64_t offset, size_t size);
+
+}  // namespace simulator

@@ -6,6 +6,8 @@
 #include <cstdint>
 #include <string_view>
 
+namespace simulator {
+
 class ByteReader {
  public:
   explicit ByteReader(std::string_view bytes) : bytes_(bytes) {}
@@ -44,3 +46,5 @@ class ByteReader {
 
   std::string_view bytes_;
 };
+
+}  // namespace simulator

@@ -5,6 +5,8 @@
 #include "simulator/package/der.h"
 #include "simulator/package/distinguished_name.h"
 
+namespace simulator {
+
 namespace {
 
 PublicKey ReadKey(CBS info);
@@ -148,3 +150,5 @@ std::string_view WithoutLeadingZeros(std::string_view number) {
 }
 
 }  // namespace
+
+}  // namespace simulator

@@ -7,6 +7,8 @@
 #include <string>
 #include <string_view>
 
+namespace simulator {
+
 struct PublicKey {
   std::string algorithm;  // "RSA", "EC" or "DSA"; else the object identifier
   int bits = 0;           // 0: not known
@@ -35,3 +37,5 @@ std::string Sha256Hex(std::string_view bytes);
 
 // The lower-case hexadecimal digits of the bytes.
 std::string HexText(std::string_view bytes);
+
+}  // namespace simulator

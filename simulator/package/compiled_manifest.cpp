@@ -6,6 +6,8 @@
 #include "simulator/package/byte_reader.h"
 #include "simulator/package/utf8.h"
 
+namespace simulator {
+
 namespace {
 
 // Chunks: a type and a header size of 16 bits each, the whole size as 32 bits.
@@ -200,3 +202,5 @@ std::string Strings::Utf16At(size_t offset) const {
 }
 
 }  // namespace
+
+}  // namespace simulator

@@ -7,6 +7,8 @@
 #include <string>
 #include <string_view>
 
+namespace simulator {
+
 struct AndroidManifest {
   std::string package_name;  // empty: not found
   // The attribute android:extractNativeLibs of the application; none when it is not there.
@@ -14,3 +16,5 @@ struct AndroidManifest {
 };
 
 AndroidManifest ParseCompiledManifest(std::string_view bytes);
+
+}  // namespace simulator

@@ -2,6 +2,8 @@
 
 #include <openssl/mem.h>
 
+namespace simulator {
+
 namespace {
 
 struct NamedOid {
@@ -51,3 +53,5 @@ std::string OidText(const CBS& contents) {
 std::string SignatureAlgorithmName(CBS algorithm) { return NameOf(algorithm, kSignatures); }
 
 std::string DigestName(CBS algorithm) { return NameOf(algorithm, kDigests); }
+
+}  // namespace simulator

@@ -6,6 +6,8 @@
 #include <string>
 #include <string_view>
 
+namespace simulator {
+
 inline CBS ToCbs(std::string_view bytes) {
   CBS cbs;
   CBS_init(&cbs, reinterpret_cast<const uint8_t*>(bytes.data()), bytes.size());
@@ -25,3 +27,5 @@ std::string SignatureAlgorithmName(CBS algorithm);
 
 // The name of a digest algorithm, such as "SHA-256"; of another, the object identifier.
 std::string DigestName(CBS algorithm);
+
+}  // namespace simulator

@@ -6,6 +6,8 @@
 #include "simulator/package/der.h"
 #include "simulator/package/utf8.h"
 
+namespace simulator {
+
 namespace {
 
 constexpr struct {
@@ -130,3 +132,5 @@ std::string Quoted(const std::string& value) {
 }
 
 }  // namespace
+
+}  // namespace simulator

@@ -5,5 +5,9 @@
 #include <string>
 #include <string_view>
 
+namespace simulator {
+
 // `der` is a Name (RFC 5280 §4.1.2.4). UTF-8; empty where it does not read.
 std::string NameText(std::string_view der);
+
+}  // namespace simulator

@@ -14,6 +14,8 @@
 #include "simulator/package/signature_block.h"
 #include "simulator/package/signing_block.h"
 
+namespace simulator {
+
 namespace {
 
 constexpr char kManifestName[] = "META-INF/MANIFEST.MF";
@@ -178,3 +180,5 @@ bool EndsWith(const std::string& text, const std::string& end) {
 }
 
 }  // namespace
+
+}  // namespace simulator

@@ -12,6 +12,8 @@
 #include "simulator/package/certificate.h"
 #include "simulator/package/compiled_manifest.h"
 
+namespace simulator {
+
 enum class FileKind {
   kUnreadable,  // it cannot be opened; `error` says why
   kFolder,
@@ -79,3 +81,5 @@ PackageFacts LookAt(const std::string& path);
 
 // The names of the schemes after v1 that somebody signed with, each once, in the file's order.
 std::vector<std::string> NewerSchemes(const PackageFacts& facts);
+
+}  // namespace simulator

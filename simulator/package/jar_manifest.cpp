@@ -1,5 +1,7 @@
 #include "simulator/package/jar_manifest.h"
 
+namespace simulator {
+
 namespace {
 
 // More attributes than this are not read; a package of 65,535 entries has a tenth of them.
@@ -74,3 +76,5 @@ bool StatesManifestDigest(std::string_view signature_file) {
   }
   return false;
 }
+
+}  // namespace simulator

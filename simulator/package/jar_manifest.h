@@ -9,6 +9,8 @@
 #include <utility>
 #include <vector>
 
+namespace simulator {
+
 // A section: each attribute's name and value, in the order of the text. Continuation lines are put
 // together; a line without a colon and a space is passed over.
 using ManifestSection = std::vector<std::pair<std::string, std::string>>;
@@ -24,3 +26,5 @@ std::string ClaimedSchemes(std::string_view signature_file);
 
 // Whether the signature file states a digest of the whole manifest, of whatever kind.
 bool StatesManifestDigest(std::string_view signature_file);
+
+}  // namespace simulator

@@ -2,6 +2,8 @@
 
 #include "simulator/package/der.h"
 
+namespace simulator {
+
 namespace {
 
 constexpr unsigned kContext0 = CBS_ASN1_CONSTRUCTED | CBS_ASN1_CONTEXT_SPECIFIC | 0;
@@ -84,3 +86,5 @@ bool ReadSigner(CBS signer, SignatureBlockFacts* facts) {
 }
 
 }  // namespace
+
+}  // namespace simulator

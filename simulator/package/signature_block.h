@@ -7,6 +7,8 @@
 #include <string>
 #include <string_view>
 
+namespace simulator {
+
 struct SignatureBlockFacts {
   bool is_whole = false;         // the block read to its last signer
   std::string_view certificate;  // the first one, which is the one that the tool takes; DER
@@ -19,3 +21,5 @@ struct SignatureBlockFacts {
 };
 
 SignatureBlockFacts ParseSignatureBlock(std::string_view block);
+
+}  // namespace simulator

@@ -3,6 +3,8 @@
 #include "simulator/package/archive_end.h"
 #include "simulator/package/byte_reader.h"
 
+namespace simulator {
+
 namespace {
 
 constexpr char kMagic[] = "APK Sig Block 42";
@@ -97,3 +99,5 @@ bool ReadCertificate(std::string_view signer, std::string_view* certificate) {
 }
 
 }  // namespace
+
+}  // namespace simulator

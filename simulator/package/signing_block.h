@@ -8,6 +8,8 @@
 #include <string_view>
 #include <vector>
 
+namespace simulator {
+
 // One signer of one scheme.
 struct NewerSigner {
   const char* scheme;            // "v2", "v3" or "v3.1"
@@ -28,3 +30,5 @@ inline constexpr uint64_t kMostBlockBytes = 16 << 20;
 std::string ReadSigningBlock(int fd);
 
 SigningBlock ParseSigningBlock(std::string_view block);
+
+}  // namespace simulator

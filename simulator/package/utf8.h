@@ -4,6 +4,8 @@
 #include <cstdint>
 #include <string>
 
+namespace simulator {
+
 // `code` is at most U+10FFFF.
 inline void AppendUtf8(uint32_t code, std::string* out) {
   const auto byte = [out](uint32_t bits) { *out += static_cast<char>(bits); };
@@ -24,3 +26,5 @@ inline void AppendUtf8(uint32_t code, std::string* out) {
     tail(0);
   }
 }
+
+}  // namespace simulator

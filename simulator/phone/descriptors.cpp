@@ -9,6 +9,8 @@
 #include <cerrno>
 #include <climits>
 
+namespace simulator {
+
 int MoveHigh(int fd) {
   constexpr rlim_t kEnough = 1024;
   rlimit limit = {};
@@ -29,3 +31,5 @@ std::string PathOf(int fd) {
   errno = errno_before;
   return length < 0 ? "" : std::string(path, static_cast<size_t>(length));
 }
+
+}  // namespace simulator

@@ -19,6 +19,8 @@
 #include "simulator/phone/next_function.h"
 #include "simulator/phone/stand_in.h"
 
+namespace simulator {
+
 namespace {
 
 using FopenFunction = FILE*(const char*, const char*);
@@ -106,3 +108,5 @@ int FileHolding(const std::string& text, bool closes_on_exec) {
 }
 
 }  // namespace
+
+}  // namespace simulator

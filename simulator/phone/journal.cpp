@@ -6,6 +6,8 @@
 #include "simulator/phone/descriptors.h"
 #include "simulator/phone/text.h"
 
+namespace simulator {
+
 Event::Event(const char* name) : line_("{\"event\":") { line_ += EncodeText(name); }
 
 Event& Event::Number(const char* key, int64_t value) {
@@ -60,3 +62,5 @@ int OpenJournal(const char* path) {
   const int fd = open(path, O_WRONLY | O_CREAT | O_APPEND | O_CLOEXEC, 0666);
   return fd < 0 ? fd : MoveHigh(fd);
 }
+
+}  // namespace simulator

@@ -8,6 +8,8 @@
 #include <string>
 #include <string_view>
 
+namespace simulator {
+
 // The version of the schema; the journal's first line carries it.
 inline constexpr int kJournalVersion = 1;
 
@@ -39,3 +41,5 @@ class Event {
 // Opens the journal at `path` for appending, close-on-exec, and keeps its descriptor out of the
 // way of those that the process opens itself; -1 when it cannot be opened.
 int OpenJournal(const char* path);
+
+}  // namespace simulator

@@ -22,6 +22,8 @@
 #include "simulator/phone/next_function.h"
 #include "simulator/phone/stand_in.h"
 
+namespace simulator {
+
 namespace {
 
 constexpr int kSignCommand = 1124;
@@ -170,3 +172,5 @@ int Answer(Event* event, int error, int errno_before) {
 }
 
 }  // namespace
+
+}  // namespace simulator

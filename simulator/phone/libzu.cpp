@@ -7,6 +7,8 @@
 #include "simulator/phone/descriptors.h"
 #include "simulator/phone/stand_in.h"
 
+namespace simulator {
+
 namespace {
 
 // What the tool gets on a workstation, where there is no service to register with.
@@ -24,3 +26,5 @@ STAND_IN int ZuNewCertificate(int fd, const char* name, const unsigned char* dat
   Record(event.Hex("data", data == nullptr ? "" : bytes).Number("result", result));
   return result;
 }
+
+}  // namespace simulator

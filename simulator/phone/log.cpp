@@ -8,6 +8,8 @@
 
 #include "simulator/phone/stand_in.h"
 
+namespace simulator {
+
 namespace {
 
 // The log cuts a record's text to this size, the closing NUL included.
@@ -79,3 +81,5 @@ STAND_IN void __android_log_assert(const char* condition, const char* tag, const
   }
   abort();
 }
+
+}  // namespace simulator

@@ -3,9 +3,13 @@
 
 #include <dlfcn.h>
 
+namespace simulator {
+
 // The next function `name` behind this library in the order of loading: the one that the process
 // would call without the stand-in.
 template <typename Function>
 Function* NextFunction(const char* name) {
   return reinterpret_cast<Function*>(dlsym(RTLD_NEXT, name));
 }
+
+}  // namespace simulator

@@ -4,6 +4,8 @@
 
 #include "simulator/phone/text.h"
 
+namespace simulator {
+
 namespace {
 
 constexpr char kJournal[] = "APKTOOLKIT_SIM_JOURNAL";       // a path
@@ -70,3 +72,5 @@ std::string Assignment(const char* name, const std::string& value) {
 }
 
 }  // namespace
+
+}  // namespace simulator

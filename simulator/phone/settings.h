@@ -9,6 +9,8 @@
 #include <string>
 #include <vector>
 
+namespace simulator {
+
 // A file as the kernel tells files apart, whatever its name.
 struct FileId {
   dev_t device;
@@ -43,3 +45,5 @@ PhoneSettings SettingsFromEnvironment();
 
 // The same as NAME=VALUE words, complete: no setting is left to what a variable was before.
 std::vector<std::string> SettingsToEnvironment(const PhoneSettings& phone);
+
+}  // namespace simulator

@@ -1,5 +1,7 @@
 #include "simulator/phone/stand_in.h"
 
+namespace simulator {
+
 namespace {
 
 // Open from the start, so that a process without a free descriptor is recorded all the same.
@@ -25,3 +27,5 @@ void Record(const Event& event) {
   const ErrnoKeeper keeper;
   if (JournalDescriptor() >= 0) event.AppendTo(JournalDescriptor());
 }
+
+}  // namespace simulator

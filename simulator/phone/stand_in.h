@@ -11,6 +11,8 @@
 // The mark of a function that takes the place of another library's; all else stays hidden.
 #define STAND_IN extern "C" __attribute__((visibility("default")))
 
+namespace simulator {
+
 // The phone of this process, read from the environment when it is first asked for.
 const PhoneSettings& ThisPhone();
 
@@ -28,3 +30,5 @@ class ErrnoKeeper {
  private:
   const int errno_;
 };
+
+}  // namespace simulator

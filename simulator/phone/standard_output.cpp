@@ -8,6 +8,8 @@
 
 #include "simulator/phone/stand_in.h"
 
+namespace simulator {
+
 namespace {
 
 ssize_t Print(void*, const char* bytes, size_t size) {
@@ -29,3 +31,5 @@ __attribute__((constructor)) void ReplaceStandardOutput() {
 __attribute__((destructor)) void FlushStandardOutput() { fflush(stdout); }
 
 }  // namespace
+
+}  // namespace simulator

@@ -4,6 +4,8 @@
 #include <cstdint>
 #include <cstdio>
 
+namespace simulator {
+
 namespace {
 
 bool IsPrivateByte(std::string_view character);
@@ -99,3 +101,5 @@ void AppendEscape(unsigned code, std::string* out) {
 }
 
 }  // namespace
+
+}  // namespace simulator

@@ -7,6 +7,8 @@
 #include <string_view>
 #include <vector>
 
+namespace simulator {
+
 // `bytes` as a JSON string with its quotation marks. UTF-8 stays as it is; a byte that belongs to
 // no valid UTF-8 character is written as the private character U+F7XX, XX being the byte. For the
 // sake of the way back, the bytes of the characters U+F780 to U+F7FF themselves are written so,
@@ -21,3 +23,5 @@ size_t Utf8Length(std::string_view bytes);
 
 // The parts of `text` between the separators; one empty part when `text` is empty.
 std::vector<std::string> Split(const std::string& text, char separator);
+
+}  // namespace simulator

@@ -27,6 +27,8 @@
 
 #include "simulator/phone/next_function.h"
 
+using simulator::NextFunction;
+
 extern "C" {
 void* __libc_malloc(size_t size);
 void* __libc_calloc(size_t count, size_t size);

@@ -12,12 +12,14 @@
 
 #include "simulator/phone/settings.h"
 #include "simulator/phone/text.h"
-#include "simulator/program/events.h"
-#include "simulator/program/run.h"
+#include "simulator/run/events.h"
+#include "simulator/run/tool_process.h"
 #include "support/expected_timeline.h"
 #include "support/files.h"
 #include "support/package.h"
 #include "support/simulation.h"
+
+using namespace simulator;
 
 namespace {
 
@@ -54,7 +56,7 @@ class Installed {
   }
 
   struct Outcome {
-    Ending ending;
+    ToolEnd ending;
     bool failed;  // the call that was to fail was made
     // What was granted, a letter each, in their order: the library, the package and its key (N:
     // under an empty name); a JAR.
@@ -67,7 +69,7 @@ class Installed {
     std::filesystem::remove(folder_ / "report");
     std::filesystem::remove(folder_ / "journal");
     phone_.journal = folder_ / "journal";
-    Command command = {
+    ToolCommand command = {
         {}, TOOL_PATH, file_, FAULT_INJECTOR ":" KERNEL_STAND_IN, SettingsToEnvironment(phone_)};
     if (AreProgramsEmulated()) command.runner = Split(APKTOOLKIT_RUNNER, ' ');
     command.environment.push_back("APKTOOLKIT_FAULT=" + fault);
@@ -75,7 +77,7 @@ class Installed {
     Outcome outcome;
     {
       const KeptStandardError kept(folder_ / "errors");
-      outcome.ending = ::Run(command, Deadline(20));
+      outcome.ending = RunTool(command, Deadline(20));
     }
     outcome.failed = std::filesystem::exists(folder_ / "report");
     outcome.grants = Grants(ContentOf(phone_.journal), file_);
@@ -112,7 +114,9 @@ class Installed {
   std::string file_;
 };
 
-bool IsExit0(const Ending& ending) { return ending.end == End::kExited && ending.value == 0; }
+bool IsExit0(const ToolEnd& ending) {
+  return ending.how == ToolEnd::How::kExited && ending.value == 0;
+}
 
 // What must come of a run in which the first call of the function fails, the second, and so on.
 using Runs = std::vector<std::string>;
@@ -212,7 +216,9 @@ TEST(FaultsOfCalls, GetNoLibrarySignedThatIsNotTheManifests) {
 // The memory of the sanitizer is its own and does not fail.
 #if !HAS_OWN_MALLOC
 
-bool IsAbort(const Ending& ending) { return ending.end == End::kKilled && ending.value == SIGABRT; }
+bool IsAbort(const ToolEnd& ending) {
+  return ending.how == ToolEnd::How::kKilled && ending.value == SIGABRT;
+}
 
 // Makes each request for memory fail, one in a run. A run ends in the abort of a container, and
 // then keeps what was granted before, which is never less than with an earlier request; or it ends

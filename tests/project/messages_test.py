@@ -59,8 +59,8 @@ ROW = re.compile(r"^\| `(?P<code>[a-z0-9-]+)` \| (?P<reason>.+?) \| (?P<cure>.+?
 
 
 def reasons_problems(messages):
-    """What differs between simulator/program/causes.h, the page's tables and the schema."""
-    header = (ROOT / "simulator/program/causes.h").read_text()
+    """What differs between simulator/verdict/causes.h, the page's tables and the schema."""
+    header = (ROOT / "simulator/verdict/causes.h").read_text()
     causes = [tuple(joined(part).replace('\\"', '"') for part in row) for row in CAUSE.findall(header)]
     page = (ROOT / "docs/messages.md").read_text()
     rows = [(row["code"], row["reason"], row["cure"]) for row in ROW.finditer(page)]
@@ -68,7 +68,7 @@ def reasons_problems(messages):
     problems = [f"the page lacks or differs in {cause}" for cause in causes if cause not in rows]
     problems += [f"not in the sources: {row}" for row in rows if row not in causes]
     if len(causes) != header.count("Cause k") or len({code for code, *_ in causes}) != len(causes):
-        problems.append("simulator/program/causes.h: a row does not read, or has another's code")
+        problems.append("simulator/verdict/causes.h: a row does not read, or has another's code")
     if schema["$defs"]["reason"]["enum"] != [code for code, *_ in causes]:
         problems.append("the codes of docs/journal.schema.json are not those of the sources")
     for row in ROW.finditer(page):

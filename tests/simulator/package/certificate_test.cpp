@@ -7,6 +7,8 @@
 #include "support/files.h"
 #include "support/process.h"
 
+using namespace simulator;
+
 namespace {
 
 std::string_view View(const Bytes& bytes) {

@@ -4,6 +4,8 @@
 
 #include "support/compiled_manifest.h"
 
+using namespace simulator;
+
 namespace {
 
 AndroidManifest Read(const Bytes& bytes) {

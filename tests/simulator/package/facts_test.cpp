@@ -11,6 +11,8 @@
 #include "support/package.h"
 #include "support/signing_block.h"
 
+using namespace simulator;
+
 namespace {
 
 PackageFacts FactsOf(const Bytes& content) { return LookAt(DiskFile(content).path()); }

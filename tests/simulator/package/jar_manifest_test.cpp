@@ -2,6 +2,8 @@
 
 #include <gtest/gtest.h>
 
+using namespace simulator;
+
 namespace {
 
 using Names = std::set<std::string>;

@@ -4,6 +4,8 @@
 
 #include "support/signature_block.h"
 
+using namespace simulator;
+
 namespace {
 
 std::string_view View(const Bytes& bytes) {

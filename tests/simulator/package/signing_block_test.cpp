@@ -7,6 +7,8 @@
 #include "support/signing_block.h"
 #include "support/zip.h"
 
+using namespace simulator;
+
 namespace {
 
 std::string_view View(const Bytes& bytes) {

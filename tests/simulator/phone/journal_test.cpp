@@ -9,6 +9,8 @@
 
 #include "simulator/phone/probe_run.h"
 
+using namespace simulator;
+
 TEST(JournalEvent, IsOneLineOfJson) {
   char path[] = "/tmp/apktoolkit-journal-XXXXXX";
   const int file = mkstemp(path);

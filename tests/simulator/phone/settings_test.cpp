@@ -6,6 +6,8 @@
 
 #include "simulator/phone/probe_run.h"
 
+using namespace simulator;
+
 namespace {
 
 // Variables for the length of a test.

@@ -4,6 +4,8 @@
 
 #include "simulator/phone/probe_run.h"
 
+using namespace simulator;
+
 namespace {
 
 // What a JSON reader of another's making sees.

@@ -1,0 +1,233 @@
+#include "simulator/options.h"
+
+#include <CLI/CLI.hpp>
+#include <algorithm>
+#include <cstring>
+#include <iostream>
+
+#include "simulator/phone/text.h"
+#include "simulator/run/tool_process.h"
+
+namespace simulator {
+
+namespace {
+
+constexpr char kDescription[] =
+    "Runs apktoolkit, as it is, for each FILE inside a simulated phone, and tells\n"
+    "what the phone accepted of it, why not the rest, and what to change.";
+
+constexpr char kFooter[] =
+    "Exit status, the highest of all FILEs:\n"
+    "  0  all was signed that was to be signed\n"
+    "  1  something was refused\n"
+    "  2  the command line is wrong\n"
+    "  3  the simulation could not run, or did not end in time\n"
+    "  4  the tool could not look at a FILE: missing, no permission, read-only\n"
+    "More, with examples: man apktoolkit-sim";
+
+constexpr char kInstall[] = "--install";
+constexpr struct {
+  const char* name;
+  InstalledAbi abi;
+} kAbis[] = {{"phone", InstalledAbi::kPreferred},
+             {"all", InstalledAbi::kAll},
+             {"arm64", InstalledAbi::kArm64},
+             {"arm", InstalledAbi::kArm}};
+
+constexpr char kThePhone[] = "The phone";
+constexpr char kTheRun[] = "The run";
+
+std::vector<std::string> WordsOf(int argc, char** argv);
+void AddPhone(CLI::App* app, Options* options);
+void AddKernelAnswer(CLI::App* app, const char* name, int* error, const char* description);
+void AddInstallation(CLI::App* app, Options* options);
+void AddOutput(CLI::App* app, Options* options);
+void AddRun(CLI::App* app, Options* options, std::string* runner);
+int ErrorNumber(const std::string& name);
+std::optional<int> NameUnknownOption(const CLI::App& app);
+
+}  // namespace
+
+std::optional<int> ParseOptions(int argc, char** argv, Options* options) {
+  CLI::App app(kDescription, "apktoolkit-sim");
+  app.footer(kFooter);
+  app.get_formatter()->column_width(28);
+  app.allow_extras();  // so that they can be named
+  options->run.tool = ProgramDirectory() + "/apktoolkit";
+  std::string runner;
+
+  app.add_option("FILE", options->files, "Packages, JARs or other files")
+      ->type_name("")
+      ->required();
+  AddPhone(&app, options);
+  AddInstallation(&app, options);
+  AddOutput(&app, options);
+  AddRun(&app, options, &runner);
+  app.set_help_flag("-h,--help", "Print this help")->group(kTheRun);
+  app.set_version_flag("--version", "apktoolkit-sim " APKTOOLKIT_VERSION, "Print the version")
+      ->group(kTheRun);
+  try {
+    app.parse(WordsOf(argc, argv));
+  } catch (const CLI::RequiredError& error) {
+    if (const auto status = NameUnknownOption(app)) return status;
+    app.exit(error);
+    return kUsageError;
+  } catch (const CLI::ParseError& error) {
+    return app.exit(error) == 0 ? 0 : kUsageError;
+  }
+  for (const std::string& word : Split(runner, ' ')) {
+    if (!word.empty()) options->run.runner.push_back(word);
+  }
+  return NameUnknownOption(app);
+}
+
+namespace {
+
+// The command line as CLI11 takes it, from the back, with the value that an --install without one
+// stands for: the word after it is a file.
+std::vector<std::string> WordsOf(int argc, char** argv) {
+  std::vector<std::string> words(argv + std::min(argc, 1), argv + argc);
+  const auto end_of_options = std::find(words.begin(), words.end(), "--");
+  std::replace(words.begin(), end_of_options, std::string(kInstall),
+               std::string(kInstall) + "=" + kAbis[0].name);
+  std::reverse(words.begin(), words.end());
+  return words;
+}
+
+void AddPhone(CLI::App* app, Options* options) {
+  PhoneSettings* const phone = &options->run.phone;
+  app->add_option_function<std::string>(
+         "--integrity", [phone](const std::string& text) { phone->integrity = Split(text, ','); },
+         "What the tool reads as its integrity value;\n"
+         "the last repeats, \"missing\" is no file\n"
+         "[default: 1f]")
+      ->type_name("TEXT[,TEXT]...")
+      ->group(kThePhone);
+  AddKernelAnswer(app, "--sign-errno", &phone->sign_errno,
+                  "The kernel answers every signing with this\n"
+                  "error, such as EPERM [default: it signs]");
+  AddKernelAnswer(app, "--verify-errno", &phone->verify_errno,
+                  "The kernel's answer for a file that it does\n"
+                  "not trust [default: ENOKEY]");
+  app->add_option("--zu-result", phone->zu_result, "What libzu answers [default: 0]")
+      ->type_name("N")
+      ->group(kThePhone);
+  app->add_option("--trust", options->run.trust, "The kernel trusts this file; may be repeated")
+      ->check(CLI::ExistingFile.description(""))
+      ->type_name("FILE")
+      ->allow_extra_args(false)
+      ->group(kThePhone);
+  app->add_option("--state", options->run.state,
+                  "Remember in DIR what was signed, and trust it\n"
+                  "while its bytes stay the same")
+      ->type_name("DIR")
+      ->group(kThePhone);
+}
+
+void AddKernelAnswer(CLI::App* app, const char* name, int* error, const char* description) {
+  const auto check = [](const std::string& text) {
+    return ErrorNumber(text) == 0 ? "no error has the name " + text : std::string();
+  };
+  const auto set = [error](const std::string& text) { *error = ErrorNumber(text); };
+  app->add_option_function<std::string>(name, set, description)
+      ->type_name("NAME")
+      ->check(check)
+      ->group(kThePhone);
+}
+
+void AddInstallation(CLI::App* app, Options* options) {
+  const auto install = [options](const std::string& name) {
+    for (const auto& abi : kAbis) {
+      if (name == abi.name) options->run.abi = abi.abi;
+    }
+  };
+  const auto check = [](const std::string& name) {
+    const bool is_known = std::any_of(std::begin(kAbis), std::end(kAbis),
+                                      [&name](const auto& abi) { return name == abi.name; });
+    return is_known ? std::string() : "there are phone, all, arm64 and arm, and no " + name;
+  };
+  app->add_option_function<std::string>(kInstall, install,
+                                        "Lay the libraries out first, as an installer\n"
+                                        "does, in a folder of their own: for phone, all,\n"
+                                        "arm64 or arm [default: phone]")
+      ->type_name("[=ABI]")
+      ->check(check)
+      ->group(kTheRun);
+  app->add_flag("--strict", options->judge.is_strict,
+                "A library that does not lie beside its package\n"
+                "counts as refused")
+      ->group(kTheRun);
+}
+
+void AddOutput(CLI::App* app, Options* options) {
+  const auto print = [app, options](const char* name, Detail detail, const char* description) {
+    const auto set = [name, options, detail](int64_t) {
+      if (options->detail != Detail::kUsual) {
+        throw CLI::ValidationError(name, "--quiet and --verbose exclude each other");
+      }
+      options->detail = detail;
+    };
+    app->add_flag_function(name, set, description)->group(kTheRun);
+  };
+  print("--quiet", Detail::kVerdict, "Print the verdicts alone");
+  print("--verbose", Detail::kAll,
+        "Print also what the signature leaves out, every\n"
+        "signer, and the chain from key to entries");
+  app->add_flag("--json", options->json, "Print the journal, one JSON object a line")
+      ->group(kTheRun);
+  app->add_option("--journal", options->journal, "Keep the journal in FILE")
+      ->type_name("FILE")
+      ->group(kTheRun);
+  app->add_option("--html", options->html, "Write all of it to FILE, a page for a browser")
+      ->type_name("FILE")
+      ->group(kTheRun);
+}
+
+void AddRun(CLI::App* app, Options* options, std::string* runner) {
+  app->add_option("--jobs", options->run.jobs, "Look at so many files at a time [default: 1]")
+      ->type_name("N")
+      ->check(CLI::Range(1, 1024).description(""))
+      ->group(kTheRun);
+  app->add_option("--timeout", options->run.timeout,
+                  "Give up a file that takes longer\n"
+                  "[default: 30]")
+      ->type_name("SECONDS")
+      ->check(CLI::Range(0.001, 1e6).description(""))
+      ->group(kTheRun);
+  app->add_option("--tool", options->run.tool,
+                  "The program to run [default: the apktoolkit\n"
+                  "beside this program]")
+      ->type_name("PATH")
+      ->group(kTheRun);
+  app->add_option("--runner", *runner,
+                  "Words to put before the tool: an emulator that\n"
+                  "takes -E NAME=VALUE [default: none]")
+      ->type_name("COMMAND")
+      ->take_last()
+      ->group(kTheRun);
+}
+
+// What begins with "-" and is no option may have been meant for a file.
+std::optional<int> NameUnknownOption(const CLI::App& app) {
+  std::vector<std::string> unknown = app.remaining();
+  unknown.erase(std::remove(unknown.begin(), unknown.end(), "--"), unknown.end());
+  if (unknown.empty()) return {};
+  const std::string word = Printable(unknown[0], {});
+  std::cerr << "there is no option " << word << " (a file of that name: ./" << word
+            << ")\nRun with --help for more information.\n";
+  return kUsageError;
+}
+
+// 0 when there is no error of this name.
+int ErrorNumber(const std::string& name) {
+  constexpr int kLast = 4095;  // the highest that a system call can answer
+  for (int error = 1; error <= kLast; ++error) {
+    const char* const known = strerrorname_np(error);
+    if (known != nullptr && name == known) return error;
+  }
+  return 0;
+}
+
+}  // namespace
+
+}  // namespace simulator

@@ -1,0 +1,21 @@
+// Until when a file may keep the simulator busy.
+#pragma once
+
+#include <chrono>
+
+namespace simulator {
+
+class Deadline {
+ public:
+  explicit Deadline(double seconds) : end_(Clock::now() + Seconds(seconds)) {}
+
+  bool HasPassed() const { return Clock::now() >= end_; }
+
+ private:
+  using Clock = std::chrono::steady_clock;
+  using Seconds = std::chrono::duration<double>;
+
+  std::chrono::time_point<Clock, Seconds> end_;
+};
+
+}  // namespace simulator

@@ -1,0 +1,47 @@
+#include "simulator/run/process.h"
+
+#include <fcntl.h>
+#include <signal.h>
+#include <unistd.h>
+
+#include <initializer_list>
+
+namespace simulator {
+
+namespace {
+
+volatile sig_atomic_t caught = 0;
+
+void Catch(int signal) { caught = signal; }
+
+}  // namespace
+
+// What takes the place is closed by exec, and cannot be written to: output that nobody gets is a
+// failure.
+bool KeepStandardStreams() {
+  const bool has_input = fcntl(STDIN_FILENO, F_GETFD) >= 0;
+  for (const int stream : {STDIN_FILENO, STDOUT_FILENO, STDERR_FILENO}) {
+    if (fcntl(stream, F_GETFD) < 0) open("/dev/null", O_RDONLY | O_CLOEXEC);
+  }
+  return has_input;
+}
+
+void CatchInterruptions() {
+  struct sigaction action = {};
+  action.sa_handler = Catch;
+  for (const int signal : {SIGINT, SIGTERM, SIGHUP}) {
+    struct sigaction before = {};
+    sigaction(signal, nullptr, &before);
+    if (before.sa_handler != SIG_IGN) sigaction(signal, &action, nullptr);
+  }
+}
+
+bool IsInterrupted() { return caught != 0; }
+
+void EndIfInterrupted() {
+  if (caught == 0) return;
+  signal(caught, SIG_DFL);
+  raise(caught);
+}
+
+}  // namespace simulator

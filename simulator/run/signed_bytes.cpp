@@ -1,0 +1,97 @@
+#include "simulator/run/signed_bytes.h"
+
+#include <fcntl.h>
+#include <openssl/sha.h>
+#include <unistd.h>
+
+#include <algorithm>
+#include <filesystem>
+#include <fstream>
+
+#include "simulator/package/certificate.h"
+
+namespace simulator {
+
+namespace {
+
+namespace fs = std::filesystem;
+
+bool IsRegular(const std::string& path, struct stat* state) {
+  return stat(path.c_str(), state) == 0 && S_ISREG(state->st_mode);
+}
+
+// The same file, and nothing has touched it.
+bool IsUntouched(const struct stat& a, const struct stat& b) {
+  const auto same_time = [](const timespec& x, const timespec& y) {
+    return x.tv_sec == y.tv_sec && x.tv_nsec == y.tv_nsec;
+  };
+  return a.st_dev == b.st_dev && a.st_ino == b.st_ino && a.st_size == b.st_size &&
+         same_time(a.st_mtim, b.st_mtim) && same_time(a.st_ctim, b.st_ctim);
+}
+
+// Empty when the file cannot be read in time.
+std::string DigestOf(const std::string& path, const Deadline& deadline) {
+  struct stat state = {};
+  if (!IsRegular(path, &state)) return {};
+  const int fd = open(path.c_str(), O_RDONLY | O_CLOEXEC | O_NONBLOCK);
+  if (fd < 0) return {};
+  SHA256_CTX context;
+  SHA256_Init(&context);
+  std::vector<char> buffer(1 << 18);
+  ssize_t length = -1;
+  while (!deadline.HasPassed() && (length = read(fd, buffer.data(), buffer.size())) > 0) {
+    SHA256_Update(&context, buffer.data(), static_cast<size_t>(length));
+  }
+  close(fd);
+  if (length != 0) return {};
+  unsigned char digest[SHA256_DIGEST_LENGTH];
+  SHA256_Final(digest, &context);
+  return HexText({reinterpret_cast<const char*>(digest), sizeof(digest)});
+}
+
+}  // namespace
+
+bool SignedBytes::Load() {
+  if (directory_.empty()) return true;
+  std::error_code error;
+  fs::create_directories(directory_, error);
+  for (fs::directory_iterator entry(directory_, error), end; entry != end; entry.increment(error)) {
+    digests_.insert(entry->path().filename().string());
+  }
+  return !error && access(directory_.c_str(), W_OK) == 0;
+}
+
+bool SignedBytes::Holds(const std::string& path, const Deadline& deadline) {
+  struct stat state = {};
+  if (!IsRegular(path, &state)) return false;
+  if (!digests_.empty()) return digests_.count(DigestOf(path, deadline)) > 0;
+  return std::any_of(seen_.begin(), seen_.end(),
+                     [&](Seen& seen) { return IsSame(&seen, path, state, deadline); });
+}
+
+bool SignedBytes::Add(const std::string& path, const Deadline& deadline) {
+  struct stat state = {};
+  if (!IsRegular(path, &state)) return true;  // gone since it was signed: nothing is left to trust
+  if (directory_.empty()) {
+    if (shares_) seen_.push_back({path, state, ""});
+    return true;
+  }
+  const std::string digest = DigestOf(path, deadline);
+  if (digest.empty()) return !deadline.HasPassed();
+  if (shares_) digests_.insert(digest);
+  std::ofstream file(directory_ + "/" + digest);
+  file << path << '\n';
+  return static_cast<bool>(file.flush());
+}
+
+bool SignedBytes::IsSame(Seen* seen, const std::string& path, const struct stat& state,
+                         const Deadline& deadline) {
+  if (IsUntouched(seen->state, state)) return true;
+  if (seen->state.st_size != state.st_size) return false;
+  struct stat now = {};
+  const bool is_as_it_was = IsRegular(seen->path, &now) && IsUntouched(seen->state, now);
+  if (seen->digest.empty() && is_as_it_was) seen->digest = DigestOf(seen->path, deadline);
+  return !seen->digest.empty() && seen->digest == DigestOf(path, deadline);
+}
+
+}  // namespace simulator

@@ -1,0 +1,68 @@
+// One phone for all the files of a command line: what its kernel has signed so far, and the runs of
+// the tool inside it.
+#pragma once
+
+#include <optional>
+#include <string>
+#include <vector>
+
+#include "simulator/package/facts.h"
+#include "simulator/phone/settings.h"
+#include "simulator/run/installation.h"
+#include "simulator/run/run_record.h"
+#include "simulator/run/signed_bytes.h"
+
+namespace simulator {
+
+// What the phone is like, and how the tool is run in it.
+struct RunOptions {
+  PhoneSettings phone;              // all but its journal and its trusted files
+  std::vector<std::string> trust;   // existing files that the kernel trusts
+  std::string state;                // the directory that remembers what was signed; may be empty
+  std::optional<InstalledAbi> abi;  // whose libraries are laid out; none: the file stays as it lies
+  unsigned jobs = 1;                // how many files at a time
+  std::string tool;                 // the program that is run
+  std::vector<std::string> runner;  // words before the tool, such as an emulator's
+  double timeout = 30;              // seconds, for each file
+};
+
+// What one run gave to judge by.
+struct FileRun {
+  RunRecord record;
+  PackageFacts facts;   // of the file where the tool found it
+  std::string journal;  // the lines of this run, from "start" to "exit"
+};
+
+class Simulator {
+ public:
+  Simulator(const RunOptions& options, bool has_standard_input);
+  ~Simulator();
+  Simulator(const Simulator&) = delete;
+  Simulator& operator=(const Simulator&) = delete;
+
+  // Opens the state and looks for the stand-ins and the tool. False, with `error` set to what to
+  // tell the user, when the simulation cannot begin.
+  bool Prepare(std::string* error);
+
+  // Runs the tool for `file`. May be called from several threads when the options have several
+  // jobs.
+  FileRun Run(const std::string& file);
+
+ private:
+  // One run on its way: what it needs, and why it failed.
+  struct Task;
+
+  void RunToolFor(const std::string& file, Task* task);
+  PhoneSettings PhoneFor(const Task& task);
+  std::string PreloadName() const;
+  void RememberSigned(const Events& events, Task* task);
+  std::string SecondsText() const;
+
+  const RunOptions& options_;
+  const bool has_standard_input_;
+  const std::string kernel_;  // the path of the kernel stand-in
+  SignedBytes signed_;
+  int kernel_descriptor_ = -1;
+};
+
+}  // namespace simulator

@@ -1,0 +1,120 @@
+#include "simulator/run/tool_process.h"
+
+#include <fcntl.h>
+#include <signal.h>
+#include <spawn.h>
+#include <sys/wait.h>
+#include <unistd.h>
+
+#include <chrono>
+#include <climits>
+#include <map>
+#include <thread>
+
+#include "simulator/run/process.h"
+
+namespace simulator {
+
+namespace {
+
+using Words = std::vector<std::string>;
+
+Words WordsOf(const ToolCommand& command, Words* environment);
+Words EnvironmentWith(const Words& assignments);
+int Spawn(Words words, Words environment, pid_t* child);
+ToolEnd Wait(pid_t child, const Deadline& deadline);
+std::vector<char*> Pointers(Words* words);
+
+}  // namespace
+
+ToolEnd RunTool(const ToolCommand& command, const Deadline& deadline) {
+  Words environment = command.environment;
+  const Words words = WordsOf(command, &environment);
+  pid_t child = 0;
+  const int error = Spawn(words, EnvironmentWith(environment), &child);
+  if (error != 0) return {ToolEnd::How::kNotStarted, error};
+  return Wait(child, deadline);
+}
+
+const std::string& ProgramOf(const ToolCommand& command) {
+  return command.runner.empty() ? command.tool : command.runner[0];
+}
+
+std::string ProgramDirectory() {
+  char path[PATH_MAX];
+  const ssize_t length = readlink("/proc/self/exe", path, sizeof(path));
+  const std::string program(path, length < 0 ? 0 : static_cast<size_t>(length));
+  return program.substr(0, program.rfind('/'));
+}
+
+namespace {
+
+// The stand-in is loaded into the tool alone: a runner hands the variable on, and has not got it
+// itself.
+Words WordsOf(const ToolCommand& command, Words* environment) {
+  const std::string preload = "LD_PRELOAD=" + command.kernel;
+  Words words = command.runner;
+  if (words.empty()) {
+    environment->push_back(preload);
+  } else {
+    words.insert(words.end(), {"-E", preload});
+  }
+  words.insert(words.end(), {command.tool, command.file});
+  return words;
+}
+
+Words EnvironmentWith(const Words& assignments) {
+  std::map<std::string, std::string> by_name;
+  const auto assign = [&by_name](const std::string& assignment) {
+    by_name[assignment.substr(0, assignment.find('='))] = assignment;
+  };
+  for (char** variable = environ; *variable != nullptr; ++variable) assign(*variable);
+  for (const std::string& assignment : assignments) assign(assignment);
+  Words environment;
+  for (const auto& [name, assignment] : by_name) environment.push_back(assignment);
+  return environment;
+}
+
+// 0, or the errno that tells why there is no child. It gets the standard streams alone: whatever
+// the caller has open, the tool's first file is descriptor 3, as on a phone.
+int Spawn(Words words, Words environment, pid_t* child) {
+  posix_spawn_file_actions_t actions;
+  posix_spawn_file_actions_init(&actions);
+  posix_spawn_file_actions_addopen(&actions, STDOUT_FILENO, "/dev/null", O_WRONLY, 0);
+  posix_spawn_file_actions_addclosefrom_np(&actions, STDERR_FILENO + 1);
+  const std::string program = words[0];
+  const int error = posix_spawnp(child, program.c_str(), &actions, nullptr, Pointers(&words).data(),
+                                 Pointers(&environment).data());
+  posix_spawn_file_actions_destroy(&actions);
+  return error;
+}
+
+// For the C interface; ends with a null pointer.
+std::vector<char*> Pointers(Words* words) {
+  std::vector<char*> pointers;
+  for (std::string& word : *words) pointers.push_back(word.data());
+  pointers.push_back(nullptr);
+  return pointers;
+}
+
+ToolEnd Wait(pid_t child, const Deadline& deadline) {
+  int status = 0;
+  bool timed_out = false;
+  while (waitpid(child, &status, WNOHANG) == 0) {
+    if (!deadline.HasPassed() && !IsInterrupted()) {
+      std::this_thread::sleep_for(std::chrono::milliseconds(2));
+    } else {
+      timed_out = true;
+      kill(child, SIGKILL);
+      waitpid(child, &status, 0);
+      break;
+    }
+  }
+  if (timed_out) return {ToolEnd::How::kTimedOut, 0};
+  return WIFEXITED(status) ? ToolEnd{ToolEnd::How::kExited, WEXITSTATUS(status)}
+                           : ToolEnd{ToolEnd::How::kKilled, WTERMSIG(status)};
+}
+
+}  // namespace
+
+}  // namespace simulator

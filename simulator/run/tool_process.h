@@ -1,0 +1,38 @@
+// Starts the tool with the stand-ins in place and waits for its end.
+#pragma once
+
+#include <string>
+#include <vector>
+
+#include "simulator/run/deadline.h"
+
+namespace simulator {
+
+struct ToolCommand {
+  std::vector<std::string> runner;  // words before the tool, such as an emulator's; mostly none
+  std::string tool;
+  std::string file;                      // the tool's one argument
+  std::string kernel;                    // the library that is loaded before all others
+  std::vector<std::string> environment;  // NAME=VALUE, over what this process has
+};
+
+struct ToolEnd {
+  enum class How { kExited, kKilled, kTimedOut, kNotStarted };
+
+  How how;
+  int value;  // kExited: the status. kKilled: the signal. kNotStarted: the errno. Otherwise 0.
+};
+
+// Runs the command to its end. Its standard output goes nowhere, since the journal has it; its
+// standard input and error are this process's. When the time is up, or this process is to end, the
+// tool is killed.
+ToolEnd RunTool(const ToolCommand& command, const Deadline& deadline);
+
+// The program that is started: the runner, or else the tool.
+const std::string& ProgramOf(const ToolCommand& command);
+
+// The directory that this program lies in, without a closing "/". The tool lies beside it, and the
+// stand-ins in ../lib/apktoolkit, in the build tree as where it is installed.
+std::string ProgramDirectory();
+
+}  // namespace simulator

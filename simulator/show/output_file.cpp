@@ -1,0 +1,80 @@
+#include "simulator/show/output_file.h"
+
+#include <fcntl.h>
+#include <sys/stat.h>
+#include <unistd.h>
+
+#include <cerrno>
+#include <cstring>
+#include <filesystem>
+#include <fstream>
+
+namespace simulator {
+
+namespace {
+
+namespace fs = std::filesystem;
+
+bool BeginsWith(const std::string& path, std::string_view start) {
+  std::string found(start.size(), '\0');
+  std::ifstream file(path, std::ios::binary);
+  file.read(found.data(), static_cast<std::streamsize>(found.size()));
+  return file && found == start;
+}
+
+// What a path leads to, whether or not its last part is there.
+fs::path Resolved(const std::string& path) {
+  std::error_code error;
+  const fs::path resolved = fs::weakly_canonical(fs::absolute(path, error), error);
+  return error ? fs::path(path) : resolved;
+}
+
+}  // namespace
+
+OutputFile::~OutputFile() {
+  if (fd_ >= 0) close(fd_);
+}
+
+std::optional<std::string> OutputFile::Objection(const std::vector<std::string>& inputs) const {
+  const std::string named = std::string(kind_.option) + " " + path_;
+  struct stat state = {};
+  if (stat(path_.c_str(), &state) != 0 || !S_ISREG(state.st_mode)) return {};
+  for (const std::string& input : inputs) {
+    struct stat other = {};
+    if (stat(input.c_str(), &other) == 0 && other.st_dev == state.st_dev &&
+        other.st_ino == state.st_ino) {
+      return named + " is a file that is to be looked at; it is left alone";
+    }
+  }
+  if (state.st_size == 0 || BeginsWith(path_, kind_.start)) return {};
+  return named + " is there and holds no " + kind_.name + " of apktoolkit-sim; it is left alone";
+}
+
+bool OutputFile::IsSameAs(const OutputFile& other) const {
+  if (!IsWanted() || !other.IsWanted()) return false;
+  std::error_code error;
+  if (fs::is_other(path_, error)) return false;
+  return Resolved(path_) == Resolved(other.path_) || fs::equivalent(path_, other.path_, error);
+}
+
+bool OutputFile::Open() {
+  if (!IsWanted()) return true;
+  fd_ = open(path_.c_str(), O_WRONLY | O_CREAT | O_TRUNC | O_CLOEXEC, 0666);
+  return fd_ >= 0;
+}
+
+bool OutputFile::Append(std::string_view text) const {
+  while (IsWanted() && !text.empty()) {
+    const ssize_t part = write(fd_, text.data(), text.size());
+    if (part <= 0) return false;
+    text.remove_prefix(static_cast<size_t>(part));
+  }
+  return true;
+}
+
+std::string OutputFile::ErrorText() const {
+  return std::string("cannot write the ") + kind_.name + " " + path_ + ": " +
+         strerrordesc_np(errno);
+}
+
+}  // namespace simulator

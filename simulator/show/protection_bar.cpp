@@ -1,0 +1,57 @@
+#include "simulator/show/protection_bar.h"
+
+#include <algorithm>
+
+#include "simulator/show/report_words.h"
+
+namespace simulator {
+
+namespace {
+
+// Entries may overlap and claim more bytes than the file has; then nothing lies between them.
+Share Between(const Protection& protection, uint64_t file_size) {
+  uint64_t rest = file_size;
+  for (const Share* share :
+       {&protection.verified, &protection.vouched, &protection.unlisted, &protection.signature}) {
+    rest -= std::min(rest, share->bytes);
+  }
+  return {0, rest};
+}
+
+}  // namespace
+
+std::vector<BarPart> MakeShareBar(const Protection& protection, uint64_t file_size) {
+  constexpr double kLeast = 0.75;  // percent of the width, for whatever is there
+  std::vector<BarPart> parts = {
+      {"verified", kVerifiedWord, "dex and native libraries, compared with the manifest", true,
+       protection.verified, 0, 0, 0},
+      {"vouched", kVouchedWord, "the manifest has a digest, which nothing was found to match", true,
+       protection.vouched, 0, 0, 0},
+      {"unlisted", kUnlistedWord, "no digest in the manifest: anyone may have changed them", true,
+       protection.unlisted, 0, 0, 0},
+      {"signature", "the signature itself", "manifest, signature files and their blocks", true,
+       protection.signature, 0, 0, 0},
+      {"between", "between the entries", "headers, directory, padding, newer signing block", false,
+       Between(protection, file_size), 0, 0, 0}};
+  double all = 0;
+  size_t entries = 0;
+  double free_width = 100;
+  for (const BarPart& part : parts) {
+    all += static_cast<double>(part.share.bytes);
+    entries += part.share.entries;
+    if (part.share.bytes > 0) free_width -= kLeast;
+  }
+  if (entries == 0) return {};
+  double start = 0;
+  for (BarPart& part : parts) {
+    part.start = start;
+    if (part.share.bytes == 0) continue;
+    const double share = static_cast<double>(part.share.bytes) / all;
+    part.percent = 100 * share;
+    part.width = kLeast + free_width * share;
+    start += part.width;
+  }
+  return parts;
+}
+
+}  // namespace simulator

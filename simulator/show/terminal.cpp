@@ -1,0 +1,78 @@
+#include "simulator/show/terminal.h"
+
+#include <langinfo.h>
+#include <unistd.h>
+
+#include <clocale>
+#include <cstdint>
+#include <cstdio>
+#include <cstdlib>
+#include <cstring>
+
+#include "simulator/phone/text.h"
+
+namespace simulator {
+
+namespace {
+
+bool IsShown(std::string_view character, const Look& look) {
+  const uint8_t first = static_cast<uint8_t>(character[0]);
+  if (character.size() == 1) return first >= 0x20 && first != 0x7f;
+  if (!look.has_utf8) return false;
+  const uint8_t second = static_cast<uint8_t>(character[1]);
+  // U+0080 to U+009F are controls, and U+061C turns what stands around it.
+  if (character.size() == 2) {
+    return (first != 0xc2 || second >= 0xa0) && (first != 0xd8 || second != 0x9c);
+  }
+  if (character.size() > 3) return true;
+  // U+200B to U+200F, U+2028 to U+202E, U+2060 to U+206F and U+FEFF have no width or turn what
+  // stands around them.
+  const uint8_t third = static_cast<uint8_t>(character[2]);
+  if (first == 0xe2 && second == 0x80) {
+    return (third < 0x8b || third > 0x8f) && (third < 0xa8 || third > 0xae);
+  }
+  if (first == 0xe2 && second == 0x81) return third < 0xa0 || third > 0xaf;
+  return first != 0xef || second != 0xbb || third != 0xbf;
+}
+
+}  // namespace
+
+Look LookOfStandardOutput() {
+  setlocale(LC_CTYPE, "");
+  Look look;
+  look.has_colours = isatty(STDOUT_FILENO) != 0 && getenv("NO_COLOR") == nullptr;
+  look.has_utf8 = strcmp(nl_langinfo(CODESET), "UTF-8") == 0;
+  return look;
+}
+
+std::string Printable(std::string_view bytes, const Look& look) {
+  std::string out;
+  if (!bytes.empty() && bytes.back() == '\n') bytes.remove_suffix(1);
+  while (!bytes.empty()) {
+    const size_t length = Utf8Length(bytes);
+    if (length > 0 && IsShown(bytes.substr(0, length), look)) {
+      out += bytes.substr(0, length);
+      bytes.remove_prefix(length);
+      continue;
+    }
+    char escape[8];
+    snprintf(escape, sizeof(escape), "\\x%02x", static_cast<uint8_t>(bytes[0]));
+    out += escape;
+    bytes.remove_prefix(1);
+  }
+  return out;
+}
+
+std::string Coloured(const std::string& text, Colour colour, const Look& look) {
+  constexpr const char* kCodes[] = {"", "\x1b[32m", "\x1b[31m", "\x1b[33m"};
+  if (!look.has_colours || colour == Colour::kPlain) return text;
+  return kCodes[static_cast<size_t>(colour)] + text + "\x1b[0m";
+}
+
+size_t Columns(std::string_view text) {
+  size_t columns = 0;
+  for (const char c : text) columns += (static_cast<uint8_t>(c) & 0xc0U) != 0x80 ? 1 : 0;
+  return columns;
+}
+
+}  // namespace simulator

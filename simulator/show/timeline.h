@@ -1,0 +1,27 @@
+// The readable form of what happened, line by line and in order; nothing is left out.
+#pragma once
+
+#include <ostream>
+#include <string>
+#include <vector>
+
+#include "simulator/run/events.h"
+#include "simulator/show/terminal.h"
+
+namespace simulator {
+
+// How one thing that happened reads; texts come as they are.
+struct TimelineLine {
+  std::string what;  // such as "sign"
+  std::string text;
+  std::string detail;  // for a line of its own below; mostly empty
+  bool is_failure = false;
+};
+
+// The events of one run. Paths below the folder of the file at `path` are shown without it; what
+// happened several times in a row is one line.
+std::vector<TimelineLine> MakeTimeline(const Events& events, const std::string& path);
+
+void PrintTimeline(const std::vector<TimelineLine>& lines, const Look& look, std::ostream& out);
+
+}  // namespace simulator

@@ -1,0 +1,16 @@
+// The journal's last word on a file: its report as one event (docs/journal.md).
+#pragma once
+
+#include <string>
+
+#include "simulator/verdict/report.h"
+
+namespace simulator {
+
+// The whole line, with its end.
+std::string VerdictEvent(const Report& report);
+
+// The name of a verdict for programs, such as "partly-signed".
+const char* CodeOf(Verdict verdict);
+
+}  // namespace simulator

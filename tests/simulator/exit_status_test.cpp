@@ -1,0 +1,214 @@
+// With which status apktoolkit-sim ends, and what it says then.
+#include <gtest/gtest.h>
+#include <sys/stat.h>
+#include <unistd.h>
+
+#include "simulator/simulated.h"
+
+TEST(ExitStatus, ZeroWhenAllWasSigned) {
+  const Probe probe({"sign 3 0100ab"});
+  const ProcessResult result = Simulated({probe.path()});
+  EXPECT_EQ(result.status, 0);
+  EXPECT_EQ(result.errors, "");
+  EXPECT_EQ(LinesOf(result.output)[0], "SIGNED  " + probe.path());
+}
+
+TEST(ExitStatus, OneWhenSomethingWasRefused) {
+  const Probe probe({"log 6 ApkToolkit 61", "log 6 ApkToolkit 62"});
+  const ProcessResult result = Simulated({probe.path()});
+  EXPECT_EQ(result.status, 1);
+  EXPECT_EQ(result.errors, "");
+  EXPECT_EQ(FirstLines(result, 2), Lines({"REFUSED  " + probe.path(),
+                                          "  ✗ package  not signed: it logged an error: a|5"}));
+}
+
+TEST(ExitStatus, OneWhenTheToolWasKilled) {
+  const Probe probe({"sign 3 0100ab", "kill 9"});
+  const ProbeRun run = probe.Run();
+  EXPECT_EQ(run.status, 1);
+  EXPECT_EQ(run.events.back(), Json({{"event", "exit"}, {"signal", 9}}));
+}
+
+TEST(ExitStatus, OneWhenTheToolFailed) {
+  const ProbeRun run = Probe({"sign 3 0100ab", "exit 3"}).Run();
+  EXPECT_EQ(run.status, 1);
+  EXPECT_EQ(run.events.back(), Json({{"event", "exit"}, {"status", 3}}));
+}
+
+TEST(ExitStatus, FourForAFileThatIsNotThere) {
+  const ProcessResult result = Told({"/nowhere/base.apk"});
+  EXPECT_EQ(result.status, 4);
+  EXPECT_EQ(result.output,
+            "NOT LOOKED AT  /nowhere/base.apk\n"
+            "  ✗ file  not looked at: there is no such file\n"
+            "      Check the name; a relative one counts from the folder in which the tool is\n"
+            "      run.\n"
+            "   1  exit       status 0\n");
+}
+
+TEST(ExitStatus, FourWhenStandardInputIsClosed) {
+  const TempDir folder;
+  const std::string file = folder.Write("note.txt", ToBytes("hello\n"));
+  const ProcessResult result =
+      RunProcess({"bash", "-c", "exec \"$@\" <&-", "bash", SimulatorPath(), file});
+  EXPECT_EQ(result.status, 4);
+  EXPECT_NE(result.output.find("standard input is closed"), std::string::npos) << result.output;
+}
+
+TEST(ExitStatus, ThreeWhenTheToolDoesNotEnd) {
+  const Probe probe({"sign 3 0100ab", "sleep 60"});
+  const ProbeRun run = probe.Run({"--timeout", "3"});
+  EXPECT_EQ(run.status, 3);
+  EXPECT_EQ(run.errors, "apktoolkit-sim: " + probe.path() +
+                            ": it was still busy after 3 seconds and was stopped\n");
+  EXPECT_EQ(run.events.back(), Json({{"event", "exit"}, {"signal", 9}}));
+}
+
+// Whoever reads a pipe waits for a writer, and a device has no end: neither is read to remember it.
+TEST(ExitStatus, OneForADeviceOrAPipe) {
+  const TempDir folder;
+  const std::string pipe = folder / "pipe";
+  ASSERT_EQ(mkfifo(pipe.c_str(), 0600), 0);
+  const TempDir state;
+  state.Write("name", ToBytes("x"));
+  for (const std::string& file : {pipe, std::string("/dev/zero")}) {
+    const ProcessResult result = Told({"--timeout", "20", "--state", state.path(), file});
+    EXPECT_EQ(result.status, 1);
+    EXPECT_EQ(
+        FirstLines(result, 2),
+        Lines({"REFUSED  " + file, "  ✗ file  not signed: it is a device, a pipe or a socket"}));
+  }
+}
+
+TEST(ExitStatus, ThreeWhenTheToolIsAnotherProgramThatDoesNothing) {
+  const Probe probe({});
+  const ProcessResult result = Simulated({probe.path()});
+  EXPECT_EQ(result.status, 3);
+  EXPECT_EQ(result.errors, "apktoolkit-sim: " + probe.path() +
+                               ": the tool neither said nor did anything, though the file can be "
+                               "opened\n");
+  const Probe failing({"exit 1"});
+  const ProcessResult failed = Simulated({failing.path()});
+  EXPECT_EQ(failed.status, 3);
+  EXPECT_EQ(FirstLines(failed, 3),
+            Lines({"NOT SIMULATED  " + failing.path(), "  ✗ tool  it ended with status 1",
+                   "      Check --tool: apktoolkit ends with 0 for every file."}));
+}
+
+TEST(ExitStatus, ThreeWhenStandardOutputIsFullOrClosed) {
+  const Probe probe({"sign 3 0100ab"});
+  for (const char* script : {"exec \"$@\" >/dev/full", "exec \"$@\" >&-"}) {
+    for (const std::string& word :
+         {probe.path(), std::string("--help"), std::string("--version")}) {
+      const ProcessResult result = InShell(script, {word});
+      EXPECT_EQ(result.status, 3) << script << word;
+      EXPECT_EQ(result.errors, "apktoolkit-sim: cannot write to standard output\n");
+    }
+  }
+}
+
+TEST(ExitStatus, ThreeWhenThereIsNoTool) {
+  const ProcessResult result = RunProcess({SimulatorPath(), "--tool", "/nowhere/tool", "/"});
+  EXPECT_EQ(result.status, 3);
+  EXPECT_EQ(result.errors, "apktoolkit-sim: cannot run /nowhere/tool: No such file or directory\n");
+}
+
+TEST(ExitStatus, ThreeWhenTheToolIsNoProgram) {
+  if (AreProgramsEmulated()) GTEST_SKIP() << "the emulator starts, and not the tool";
+  const TempDir folder;
+  const std::string tool = folder.Write("tool", ToBytes("\177ELF"));
+  ASSERT_EQ(chmod(tool.c_str(), 0755), 0);
+  const ProcessResult result = RunProcess({SimulatorPath(), "--tool", tool, "/"});
+  EXPECT_EQ(result.status, 3);
+  EXPECT_EQ(result.errors, "apktoolkit-sim: /: cannot start " + tool + ": Exec format error\n");
+}
+
+TEST(ExitStatus, ThreeWhenTheStandInsAreNotInTheTool) {
+  if (AreProgramsEmulated()) GTEST_SKIP() << "the emulator hides that a program does not start";
+  const TempDir folder;
+  // What the loader would be told is lost on the way.
+  const std::string tool = folder.Write("tool", ToBytes("#!/usr/bin/env -S -u LD_PRELOAD true\n"));
+  ASSERT_EQ(chmod(tool.c_str(), 0755), 0);
+  const ProcessResult result =
+      RunProcess({SimulatorPath(), "--runner", "/nowhere/emulator", "--tool", tool, "/"});
+  EXPECT_EQ(result.status, 3);
+  EXPECT_EQ(result.errors,
+            "apktoolkit-sim: /: cannot start /nowhere/emulator: No such file or directory\n");
+  const ProcessResult runner =
+      RunProcess({SimulatorPath(), "--runner", "true", "--tool", tool, "/"});
+  EXPECT_EQ(runner.status, 3);
+  EXPECT_EQ(runner.errors, "apktoolkit-sim: /: the stand-ins were not loaded into " + tool + "\n");
+}
+
+TEST(ExitStatus, ThreeWhenTheJournalCannotBeWritten) {
+  const ProcessResult result = Simulated({"--journal", "/nowhere/journal", "/"});
+  EXPECT_EQ(result.status, 3);
+  EXPECT_EQ(result.errors,
+            "apktoolkit-sim: cannot write the journal /nowhere/journal: No such file "
+            "or directory\n");
+}
+
+TEST(ExitStatus, ThreeWhenThePageCannotBeWritten) {
+  const Probe probe({"sign 3 0100ab"});
+  const ProcessResult nowhere = Simulated({"--html", "/nowhere/page", probe.path()});
+  EXPECT_EQ(nowhere.status, 3);
+  EXPECT_EQ(nowhere.output, "");
+  EXPECT_EQ(nowhere.errors,
+            "apktoolkit-sim: cannot write the page /nowhere/page: No such file or directory\n");
+  const ProcessResult full = Simulated({"--quiet", "--html", "/dev/full", probe.path()});
+  EXPECT_EQ(full.status, 3);
+  EXPECT_EQ(full.output, "SIGNED  " + probe.path() + "\n");
+  EXPECT_EQ(full.errors,
+            "apktoolkit-sim: cannot write the page /dev/full: No space left on device\n");
+}
+
+TEST(ExitStatus, ThreeWhenTheStateCannotBeKept) {
+  const ProcessResult result = Simulated({"--state", "/dev/null", "/"});
+  EXPECT_EQ(result.status, 3);
+  EXPECT_EQ(result.errors, "apktoolkit-sim: cannot use the directory /dev/null\n");
+}
+
+TEST(ExitStatus, TwoWhenTheJournalWouldReplaceAFile) {
+  const Probe probe({"sign 3 0000"});
+  const std::string before = ContentOf(probe.path());
+  const ProcessResult result = Simulated({"--journal", probe.path(), probe.path()});
+  EXPECT_EQ(result.status, 2);
+  EXPECT_EQ(result.output, "");
+  EXPECT_EQ(result.errors, "apktoolkit-sim: --journal " + probe.path() +
+                               " is a file that is to be looked at; it is left alone\n");
+  EXPECT_EQ(ContentOf(probe.path()), before);
+}
+
+TEST(ExitStatus, TwoWhenThePageWouldReplaceAFile) {
+  const Probe probe({"sign 3 0000"});
+  const std::string notes = probe.folder().Write("notes.html", ToBytes("<!DOCTYPE html>\n<p>"));
+  for (const std::string& victim : {probe.path(), notes}) {
+    const std::string before = ContentOf(victim);
+    const ProcessResult result = Simulated({"--html", victim, probe.path()});
+    EXPECT_EQ(result.status, 2);
+    EXPECT_EQ(result.output, "");
+    EXPECT_EQ(result.errors, "apktoolkit-sim: --html " + victim +
+                                 (victim == notes ? " is there and holds no page of apktoolkit-sim"
+                                                  : " is a file that is to be looked at") +
+                                 "; it is left alone\n");
+    EXPECT_EQ(ContentOf(victim), before);
+  }
+}
+
+TEST(ExitStatus, TwoWhenPageAndJournalAreOneFile) {
+  const Probe probe({"sign 3 0000"});
+  const std::string file = probe.folder() / "file";
+  const ProcessResult result = Simulated({"--html", file, "--journal", file, probe.path()});
+  EXPECT_EQ(result.status, 2);
+  EXPECT_EQ(result.errors, "apktoolkit-sim: --journal and --html name the same file\n");
+  EXPECT_EQ(access(file.c_str(), F_OK), -1);
+}
+
+TEST(ExitStatus, IsTheHighestOfAllFiles) {
+  const Probe good({"sign 3 0000"});
+  const Probe bad({"verify 3"});
+  EXPECT_EQ(Simulated({good.path(), good.path()}).status, 0);
+  const ProcessResult result = Simulated({good.path(), bad.path(), good.path()});
+  EXPECT_EQ(result.status, 1);
+  EXPECT_EQ(Told({"/nowhere/a", "/dev/null"}).status, 4);
+}

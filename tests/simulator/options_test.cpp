@@ -1,0 +1,192 @@
+#include "simulator/options.h"
+
+#include <gtest/gtest.h>
+
+#include <cerrno>
+
+#include "simulator/phone/probe_run.h"
+#include "simulator/run/tool_process.h"
+#include "support/process.h"
+#include "support/simulation.h"
+
+using namespace simulator;
+
+namespace {
+
+// What the options are after this command line; it must be a good one.
+Options Parsed(Lines words) {
+  Options options;
+  words.insert(words.begin(), "apktoolkit-sim");
+  std::vector<char*> arguments;
+  for (std::string& word : words) arguments.push_back(word.data());
+  arguments.push_back(nullptr);
+  EXPECT_EQ(ParseOptions(static_cast<int>(words.size()), arguments.data(), &options), std::nullopt);
+  return options;
+}
+
+// The status and the standard error of the simulator for a command line.
+ProcessResult Told(const Lines& words) {
+  Lines command = {SimulatorPath()};
+  command.insert(command.end(), words.begin(), words.end());
+  return RunProcess(command);
+}
+
+}  // namespace
+
+TEST(Options, DefaultIsAHealthyPhone) {
+  const Options options = Parsed({"a.apk"});
+  EXPECT_EQ(options.files, Lines({"a.apk"}));
+  EXPECT_EQ(options.run.phone.integrity, Lines({"1f"}));
+  EXPECT_EQ(options.run.phone.sign_errno, 0);
+  EXPECT_EQ(options.run.phone.verify_errno, ENOKEY);
+  EXPECT_EQ(options.run.phone.zu_result, 0);
+  EXPECT_EQ(options.run.trust, Lines());
+  EXPECT_EQ(options.run.state, "");
+  EXPECT_EQ(options.journal, "");
+  EXPECT_EQ(options.html, "");
+  EXPECT_FALSE(options.json);
+  EXPECT_EQ(options.run.tool, ProgramDirectory() + "/apktoolkit");
+  EXPECT_EQ(options.run.runner, Lines());
+  EXPECT_EQ(options.run.timeout, 30);
+  EXPECT_EQ(options.run.abi, std::nullopt);
+  EXPECT_FALSE(options.judge.is_strict);
+  EXPECT_EQ(options.detail, Detail::kUsual);
+  EXPECT_EQ(options.run.jobs, 1U);
+}
+
+TEST(Options, EachChangesItsPartOfThePhone) {
+  const Options options = Parsed({"--integrity", "ffffffff,missing,", "--sign-errno", "EPERM",
+                                  "--verify-errno", "EBADMSG", "--zu-result", "-5", "a.apk"});
+  EXPECT_EQ(options.run.phone.integrity, Lines({"ffffffff", "missing", ""}));
+  EXPECT_EQ(options.run.phone.sign_errno, EPERM);
+  EXPECT_EQ(options.run.phone.verify_errno, EBADMSG);
+  EXPECT_EQ(options.run.phone.zu_result, -5);
+}
+
+TEST(Options, ZuResultMayBeHexadecimal) {
+  EXPECT_EQ(Parsed({"--zu-result", "0x10004", "a.apk"}).run.phone.zu_result, 65540);
+}
+
+TEST(Options, TrustTakesOneFileAtATime) {
+  const Options options =
+      Parsed({"--trust", "/dev/zero", "--trust", "/dev/null", "a.apk", "b.apk"});
+  EXPECT_EQ(options.run.trust, Lines({"/dev/zero", "/dev/null"}));
+  EXPECT_EQ(options.files, Lines({"a.apk", "b.apk"}));
+}
+
+TEST(Options, TheRestIsTakenAsItIs) {
+  const Options options =
+      Parsed({"--state", "s", "--journal", "j", "--html", "h", "--json", "--tool", "t", "--timeout",
+              "0.5", "--runner", "emulator  -L /root", "--", "-a.apk"});
+  EXPECT_EQ(options.run.state, "s");
+  EXPECT_EQ(options.journal, "j");
+  EXPECT_EQ(options.html, "h");
+  EXPECT_TRUE(options.json);
+  EXPECT_EQ(options.run.tool, "t");
+  EXPECT_EQ(options.run.timeout, 0.5);
+  EXPECT_EQ(options.run.runner, Lines({"emulator", "-L", "/root"}));
+  EXPECT_EQ(options.files, Lines({"-a.apk"}));
+}
+
+TEST(Options, WordsOfTheRunAreTakenAsTheyAre) {
+  EXPECT_EQ(Parsed({"--quiet", "a.apk"}).detail, Detail::kVerdict);
+  EXPECT_EQ(Parsed({"--verbose", "a.apk"}).detail, Detail::kAll);
+  EXPECT_TRUE(Parsed({"--strict", "a.apk"}).judge.is_strict);
+  EXPECT_EQ(Parsed({"--jobs", "8", "a.apk"}).run.jobs, 8U);
+}
+
+TEST(Options, InstallTakesItsValueAfterAnEqualsSignAlone) {
+  EXPECT_EQ(Parsed({"--install=all", "a.apk"}).run.abi, InstalledAbi::kAll);
+  EXPECT_EQ(Parsed({"--install=arm64", "a.apk"}).run.abi, InstalledAbi::kArm64);
+  EXPECT_EQ(Parsed({"--install=arm", "a.apk"}).run.abi, InstalledAbi::kArm);
+  const Options options = Parsed({"--install", "arm"});
+  EXPECT_EQ(options.run.abi, InstalledAbi::kPreferred);
+  EXPECT_EQ(options.files, Lines({"arm"}));
+  EXPECT_EQ(Parsed({"--", "--install"}).files, Lines({"--install"}));
+}
+
+TEST(Options, MistakesAreReportedWithStatusTwo) {
+  const std::vector<Lines> mistakes = {{},
+                                       {"--nonsense", "a.apk"},
+                                       {"--sign-errno", "EWHAT", "a.apk"},
+                                       {"--sign-errno", "1", "a.apk"},
+                                       {"--verify-errno", "", "a.apk"},
+                                       {"--zu-result", "x", "a.apk"},
+                                       {"--zu-result", "2147483648", "a.apk"},
+                                       {"--trust", "/nowhere/at-all", "a.apk"},
+                                       {"--timeout", "0", "a.apk"},
+                                       {"--timeout", "-1", "a.apk"},
+                                       {"--jobs", "0", "a.apk"},
+                                       {"--jobs", "x", "a.apk"},
+                                       {"--install=x86", "a.apk"},
+                                       {"--install"},
+                                       {"--quiet", "--verbose", "a.apk"},
+                                       {"--integrity"}};
+  for (const Lines& words : mistakes) {
+    const ProcessResult result = Told(words);
+    EXPECT_EQ(result.status, 2) << Json(words);
+    EXPECT_EQ(result.output, "");
+    EXPECT_NE(result.errors, "");
+  }
+}
+
+TEST(Options, AnUnknownErrorIsNamed) {
+  EXPECT_EQ(LinesOf(Told({"--sign-errno", "EWHAT", "a.apk"}).errors)[0],
+            "--sign-errno: no error has the name EWHAT");
+}
+
+TEST(Options, FileThatLooksLikeAnOptionIsNamed) {
+  EXPECT_EQ(LinesOf(Told({"-dash.apk"}).errors)[0],
+            "there is no option -dash.apk (a file of that name: ./-dash.apk)");
+}
+
+TEST(Options, HelpNamesEveryOptionAndStatus) {
+  const ProcessResult result = Told({"--help"});
+  EXPECT_EQ(result.status, 0);
+  EXPECT_EQ(result.errors, "");
+  for (const char* word : {"\nThe phone:\n",
+                           "--integrity TEXT[,TEXT]...",
+                           "--trust FILE ",
+                           "--sign-errno NAME",
+                           "--verify-errno NAME",
+                           "--zu-result N",
+                           "--state DIR",
+                           "\nThe run:\n",
+                           "--install [=ABI]",
+                           "--strict ",
+                           "--quiet ",
+                           "--verbose ",
+                           "--journal FILE",
+                           "--html FILE",
+                           "--json ",
+                           "--jobs N",
+                           "--tool PATH",
+                           "--timeout SECONDS",
+                           "--runner COMMAND",
+                           "--help ",
+                           "--version ",
+                           "\n  0  all was",
+                           "\n  1  ",
+                           "\n  2  ",
+                           "\n  3  ",
+                           "\n  4  ",
+                           "man apktoolkit-sim"}) {
+    EXPECT_NE(result.output.find(word), std::string::npos) << word << "\n" << result.output;
+  }
+}
+
+TEST(Options, HelpFitsATerminalAndShowsDefaultsInOneWay) {
+  constexpr size_t kColumns = 80;
+  std::string help = Told({"--help"}).output;
+  for (const std::string& line : LinesOf(help)) EXPECT_LE(line.size(), kColumns) << line;
+  EXPECT_EQ(help.find("=30"), std::string::npos);
+  size_t defaults = 0;
+  for (size_t at = 0; (at = help.find("[default: ", at)) != std::string::npos; ++at) ++defaults;
+  EXPECT_EQ(defaults, 9U);
+}
+
+TEST(Options, VersionIsTheProjects) {
+  const ProcessResult result = Told({"--version"});
+  EXPECT_EQ(result.status, 0);
+  EXPECT_EQ(result.output, "apktoolkit-sim " APKTOOLKIT_VERSION "\n");
+}

@@ -1,0 +1,177 @@
+#include "simulator/run/installation.h"
+
+#include <gtest/gtest.h>
+#include <sys/mman.h>
+#include <unistd.h>
+
+#include <algorithm>
+#include <filesystem>
+
+#include "support/compiled_manifest.h"
+#include "support/files.h"
+#include "support/package.h"
+
+using namespace simulator;
+
+namespace {
+
+namespace fs = std::filesystem;
+
+const Deadline kLater(1e6);
+
+// "path content" of each file that is laid out beside the package.
+std::vector<std::string> LaidOutOf(const PackageOptions& package, InstalledAbi abi,
+                                   std::vector<std::string>* left_out = nullptr) {
+  const TempDir folder;
+  const std::string file = folder / "base.apk";
+  MakePackage(package).WriteTo(file);
+  Installation installation;
+  EXPECT_EQ(installation.LayOut(file, abi, kLater), std::nullopt);
+  if (left_out != nullptr) *left_out = installation.left_out();
+  const fs::path place = fs::path(installation.path()).parent_path();
+  std::vector<std::string> files;
+  if (place == folder.path()) return files;
+  EXPECT_EQ(ContentOf(installation.path()), ContentOf(file));
+  for (const auto& entry : fs::recursive_directory_iterator(place)) {
+    if (!entry.is_regular_file() || entry.path() == installation.path()) continue;
+    files.push_back(fs::relative(entry.path(), place).string() + " " +
+                    ContentOf(entry.path().string()));
+  }
+  std::sort(files.begin(), files.end());
+  return files;
+}
+
+// The same, of a package with these libraries.
+std::vector<std::string> LaidOut(const std::vector<ZipItem>& libraries, InstalledAbi abi,
+                                 std::vector<std::string>* left_out = nullptr) {
+  return LaidOutOf(WithLibraries(libraries), abi, left_out);
+}
+
+using Files = std::vector<std::string>;
+
+const std::vector<ZipItem> kBoth = {{"lib/arm64-v8a/liba.so", ToBytes("64")},
+                                    {"lib/armeabi-v7a/liba.so", ToBytes("32"), true},
+                                    {"lib/armeabi/liba.so", ToBytes("old")},
+                                    {"lib/x86/liba.so", ToBytes("x86")}};
+
+}  // namespace
+
+TEST(Installation, OfAPhoneHasTheLibrariesOfItsOwnProcessor) {
+  EXPECT_EQ(LaidOut(kBoth, InstalledAbi::kPreferred), Files({"lib/arm64/liba.so 64"}));
+  EXPECT_EQ(LaidOut({kBoth[1], kBoth[3]}, InstalledAbi::kPreferred), Files({"lib/arm/liba.so 32"}));
+}
+
+TEST(Installation, TakesTheProcessorsThatAreAskedFor) {
+  EXPECT_EQ(LaidOut(kBoth, InstalledAbi::kAll),
+            Files({"lib/arm/liba.so 32", "lib/arm64/liba.so 64"}));
+  EXPECT_EQ(LaidOut(kBoth, InstalledAbi::kArm64), Files({"lib/arm64/liba.so 64"}));
+  EXPECT_EQ(LaidOut(kBoth, InstalledAbi::kArm), Files({"lib/arm/liba.so 32"}));
+  EXPECT_EQ(LaidOut({kBoth[2]}, InstalledAbi::kAll), Files({"lib/arm/liba.so old"}));
+}
+
+TEST(Installation, WithoutLibrariesToLayOutThePackageStaysWhereItIs) {
+  EXPECT_EQ(LaidOut({kBoth[3]}, InstalledAbi::kPreferred), Files());
+  EXPECT_EQ(LaidOut({kBoth[0]}, InstalledAbi::kArm), Files());
+  EXPECT_EQ(LaidOut({}, InstalledAbi::kAll), Files());
+}
+
+TEST(Installation, PackageThatKeepsItsLibrariesStaysWhereItIs) {
+  PackageOptions package = WithLibraries(kBoth);
+  const auto laid_out = [&package](bool extracts) {
+    constexpr uint8_t kBoolean = 0x12;
+    XmlAttribute attribute = IntAttribute("extractNativeLibs", extracts ? 0xffffffff : 0);
+    attribute.type = kBoolean;
+    CompiledXml xml;
+    xml.Start("manifest").Element("application", {InAndroidNamespace(attribute)}).End("manifest");
+    package.android_manifest = xml.Build();
+    return LaidOutOf(package, InstalledAbi::kPreferred);
+  };
+  EXPECT_EQ(laid_out(true), Files({"lib/arm64/liba.so 64"}));
+  EXPECT_EQ(laid_out(false), Files());
+}
+
+TEST(Installation, NamesDoNotLeadOutOfTheirFolder) {
+  Files left_out;
+  EXPECT_EQ(LaidOut({{"lib/arm64-v8a/liba.so", ToBytes("good")},
+                     {"lib/arm64-v8a/../../../outside.so", ToBytes("bad")},
+                     {"lib/arm64-v8a/sub/libb.so", ToBytes("bad")},
+                     {"lib/../libc.so", ToBytes("bad")},
+                     {"lib/libd.so", ToBytes("bad")}},
+                    InstalledAbi::kAll, &left_out),
+            Files({"lib/arm64/liba.so good"}));
+  std::sort(left_out.begin(), left_out.end());
+  EXPECT_EQ(left_out, Files({"lib/arm64-v8a/../../../outside.so", "lib/arm64-v8a/sub/libb.so",
+                             "lib/libd.so"}));
+}
+
+TEST(Installation, LeavesOutWhatCannotBeExtracted) {
+  ZipItem damaged = {"lib/arm64-v8a/libb.so", ToBytes("damaged")};
+  damaged.local.crc = damaged.central.crc = 1;
+  damaged.deflated = true;
+  damaged.raw = ToBytes("no deflate stream");
+  Files left_out;
+  EXPECT_EQ(
+      LaidOut({{"lib/arm64-v8a/liba.so", ToBytes("good")}, damaged}, InstalledAbi::kAll, &left_out),
+      Files({"lib/arm64/liba.so good"}));
+  EXPECT_EQ(left_out, Files({"lib/arm64-v8a/libb.so"}));
+}
+
+TEST(Installation, IsGoneWithItsOwner) {
+  const TempDir folder;
+  const std::string file = folder / "base.apk";
+  MakePackage().WriteTo(file);
+  std::string path;
+  {
+    Installation installation;
+    ASSERT_EQ(installation.LayOut(file, InstalledAbi::kPreferred, kLater), std::nullopt);
+    path = installation.path();
+    ASSERT_NE(path, file);
+    EXPECT_TRUE(fs::exists(path));
+  }
+  EXPECT_FALSE(fs::exists(fs::path(path).parent_path()));
+  EXPECT_TRUE(fs::exists(file));
+}
+
+// A file that has no name cannot get another one, as one on another file system cannot.
+TEST(Installation, OfAFileThatCannotBeLinkedIsACopyAndNotForEver) {
+  const TempDir folder;
+  MakePackage(WithLibraries({{"lib/arm64-v8a/liba.so", Bytes(3 << 20, 'a')}}))
+      .WriteTo(folder / "base.apk");
+  const std::string package = ContentOf(folder / "base.apk");
+  const int memory = memfd_create("base.apk", MFD_CLOEXEC);
+  ASSERT_EQ(write(memory, package.data(), package.size()), static_cast<ssize_t>(package.size()));
+  const std::string file = "/proc/self/fd/" + std::to_string(memory);
+  Installation copied;
+  EXPECT_EQ(copied.LayOut(file, InstalledAbi::kPreferred, kLater), std::nullopt);
+  EXPECT_NE(copied.path(), file);
+  EXPECT_EQ(ContentOf(copied.path()), package);
+  Installation late;
+  const auto problem = late.LayOut(file, InstalledAbi::kPreferred, Deadline(0));
+  close(memory);
+  ASSERT_TRUE(problem.has_value());
+  EXPECT_NE(problem->find("Connection timed out"), std::string::npos) << *problem;
+}
+
+TEST(Installation, LeavesOtherFilesWhereTheyAre) {
+  const TempDir folder;
+  for (const std::string& file :
+       {folder.path(), folder / "none", folder.Write("note.txt", ToBytes("text")),
+        std::string("/dev/zero")}) {
+    Installation installation;
+    EXPECT_EQ(installation.LayOut(file, InstalledAbi::kAll, kLater), std::nullopt);
+    EXPECT_EQ(installation.path(), file);
+  }
+}
+
+TEST(Installation, SaysWhenThereIsNoPlaceForIt) {
+  const TempDir folder;
+  const std::string file = folder / "base.apk";
+  MakePackage().WriteTo(file);
+  const char* const before = getenv("TMPDIR");
+  const std::string kept = before == nullptr ? "/tmp" : before;
+  ASSERT_EQ(setenv("TMPDIR", "/nowhere", 1), 0);
+  Installation installation;
+  const auto problem = installation.LayOut(file, InstalledAbi::kPreferred, kLater);
+  setenv("TMPDIR", kept.c_str(), 1);
+  EXPECT_TRUE(problem.has_value());
+}

@@ -1,0 +1,113 @@
+#include "simulator/run/signed_bytes.h"
+
+#include <gtest/gtest.h>
+#include <sys/stat.h>
+#include <unistd.h>
+
+#include "simulator/phone/probe_run.h"
+#include "support/der.h"
+
+using namespace simulator;
+
+namespace {
+
+const Deadline kLater(1e6);
+const Deadline kPassed(-1);
+
+// printf abc | sha256sum (FIPS 180-2, B.1)
+constexpr char kDigestOfAbc[] = "ba7816bf8f01cfea414140de5dae2223b00361a396177a9cb410ff61f20015ad";
+
+}  // namespace
+
+TEST(SignedBytes, AreTrustedUnderAnyNameWhileTheyStayTheSame) {
+  const TempDir folder;
+  const std::string file = folder.Write("file", ToBytes("abc"));
+  const std::string copy = folder.Write("copy", ToBytes("abc"));
+  SignedBytes bytes("", true);
+  ASSERT_TRUE(bytes.Load());
+  EXPECT_FALSE(bytes.Holds(file, kLater));
+  EXPECT_TRUE(bytes.Add(file, kLater));
+  EXPECT_TRUE(bytes.Holds(file, kLater));
+  EXPECT_TRUE(bytes.Holds(copy, kLater));
+  folder.Write("file", ToBytes("abd"));
+  EXPECT_FALSE(bytes.Holds(file, kLater));
+}
+
+TEST(SignedBytes, OfTheSameFileAreTrustedUnlessItWasTouched) {
+  const TempDir folder;
+  const std::string file = folder.Write("file", ToBytes("abc"));
+  SignedBytes bytes("", true);
+  EXPECT_TRUE(bytes.Add(file, kLater));
+  // Nothing need be read for that.
+  EXPECT_TRUE(bytes.Holds(file, kPassed));
+  folder.Write("file", ToBytes("abd"));
+  EXPECT_FALSE(bytes.Holds(file, kLater));
+}
+
+TEST(SignedBytes, ThatCannotBeReadInTimeAreNotTrusted) {
+  const TempDir folder;
+  const std::string file = folder.Write("file", ToBytes("abc"));
+  const std::string copy = folder.Write("copy", ToBytes("abc"));
+  SignedBytes bytes("", true);
+  EXPECT_TRUE(bytes.Add(file, kLater));
+  EXPECT_FALSE(bytes.Holds(copy, kPassed));
+  SignedBytes kept(folder / "state", true);
+  EXPECT_FALSE(kept.Add(file, kPassed));
+}
+
+TEST(SignedBytes, AreForLaterRunsAloneWhereTheFilesOfARunDoNotShareThem) {
+  const TempDir folder;
+  const std::string file = folder.Write("file", ToBytes("abc"));
+  SignedBytes first(folder / "state", false);
+  ASSERT_TRUE(first.Load());
+  EXPECT_TRUE(first.Add(file, kLater));
+  EXPECT_FALSE(first.Holds(file, kLater));
+  SignedBytes second(folder / "state", false);
+  ASSERT_TRUE(second.Load());
+  EXPECT_TRUE(second.Holds(file, kLater));
+}
+
+// Reading any of them would wait for ever, or never end.
+TEST(SignedBytes, OfPipesAndDevicesAreNotRead) {
+  const TempDir folder;
+  const std::string pipe = folder / "pipe";
+  ASSERT_EQ(mkfifo(pipe.c_str(), 0600), 0);
+  folder.Write("state/name", ToBytes("x"));
+  SignedBytes bytes(folder / "state", true);
+  ASSERT_TRUE(bytes.Load());
+  EXPECT_FALSE(bytes.Holds(pipe, kLater));
+  EXPECT_FALSE(bytes.Holds("/dev/zero", kLater));
+}
+
+TEST(SignedBytes, AreKeptByTheirDigest) {
+  const TempDir folder;
+  const std::string file = folder.Write("file", ToBytes("abc"));
+  const std::string directory = folder / "state/of/phone";
+  SignedBytes first(directory, true);
+  ASSERT_TRUE(first.Load());
+  EXPECT_TRUE(first.Add(file, kLater));
+  EXPECT_EQ(ContentOf(directory + "/" + kDigestOfAbc), file + "\n");
+  SignedBytes second(directory, true);
+  ASSERT_TRUE(second.Load());
+  EXPECT_TRUE(second.Holds(file, kLater));
+}
+
+TEST(SignedBytes, OfAFileThatCannotBeReadAreNeverTrusted) {
+  const TempDir folder;
+  SignedBytes bytes(folder / "state", true);
+  ASSERT_TRUE(bytes.Load());
+  EXPECT_TRUE(bytes.Add(folder / "missing", kLater));
+  EXPECT_FALSE(bytes.Holds(folder / "missing", kLater));
+  EXPECT_TRUE(bytes.Add(folder.path(), kLater));  // a directory
+  EXPECT_FALSE(bytes.Holds(folder.path(), kLater));
+}
+
+TEST(SignedBytes, NeedADirectoryThatCanBeUsed) {
+  const TempDir folder;
+  const std::string file = folder.Write("file", ToBytes("abc"));
+  EXPECT_FALSE(SignedBytes(file, true).Load());
+  SignedBytes bytes(folder / "state", true);
+  ASSERT_TRUE(bytes.Load());
+  ASSERT_EQ(rmdir((folder / "state").c_str()), 0);
+  EXPECT_FALSE(bytes.Add(file, kLater));
+}

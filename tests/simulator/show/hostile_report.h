@@ -1,0 +1,67 @@
+// A report in which every text that a hostile file can bring is the same one.
+#pragma once
+
+#include <string>
+
+#include "simulator/phone/journal.h"
+#include "simulator/verdict/report.h"
+
+namespace simulator {
+
+// What such a file would bring: markup for every place of a page, what a terminal obeys, bytes that
+// are no UTF-8, characters that turn the direction of writing, and marks of the page's template.
+inline const char kHostileText[] =
+    "</title></style><script>document.title='hostile'</script><img src=x onerror=alert(1)>"
+    "\"'><a href='javascript:alert(1)'>&lt;&{{verdict}}{{{verdict}}}{{&verdict}}-->"
+    "\x1b]0;x\x07\t\n\r\x7f\xff\xc3\u009b\u061c\u200b\u202e\u2066\ufeff";
+
+inline CertificateFacts HostileCertificate(const std::string& text) {
+  CertificateFacts certificate;
+  certificate.subject = certificate.sha256 = text;
+  certificate.key = {text, 2048, text, text + std::string(64, '0'), text};
+  return certificate;
+}
+
+// An event of each kind.
+inline Events HostileEvents(const std::string& text) {
+  const auto answer = [&text](const char* kind, int64_t result) {
+    return Event(kind).Text("path", text).Text("payload", text).Number("result", result).Line();
+  };
+  return ParseEvents(
+      Event("log").Number("priority", 4).Text("tag", text).Text("text", text).Line() +
+      Event("log").Number("priority", 6).Text("tag", "ApkToolkit").Text("text", text).Line() +
+      Event("integrity").Number("pid", 7).Text("text", text).Line() + answer("sign", 0) +
+      answer("verify", -1) +
+      Event("register").Text("name", text).Text("data", text).Number("result", 0).Line() +
+      Event("stdout").Text("text", text).Line() + Event("odd").Text("text", text).Line() +
+      Event("exit").Number("status", 0).Line());
+}
+
+inline Report HostileReport(const std::string& text) {
+  Report report;
+  report.file = report.path = report.package_name = text;
+  report.verdict = Verdict::kPartlySigned;
+  report.items = {
+      {ItemKind::kPackage, text, text, ItemState::kRefused, {&cause::kToolError, text}},
+      {ItemKind::kLibrary, text, text, ItemState::kDone, {}},
+      {ItemKind::kLibrary, text, text, ItemState::kAbsent, {&cause::kToolError, text}},
+      {ItemKind::kKey, text, text, ItemState::kDone, {}},
+      {ItemKind::kTool, text, text, ItemState::kRefused, {&cause::kToolNotStarted, text}}};
+  report.warnings = {{&cause::kOtherKey, text}, {&cause::kSeveralSigners, text}};
+  report.signer = HostileCertificate(text);
+  report.schemes = {text};
+  report.newer = {{text, HostileCertificate(text + "!")}};
+  report.protection.verified = {3, 300};
+  report.protection.vouched = {2, 200};
+  report.protection.unlisted = {1, 100};
+  report.protection.signature = {3, 50};
+  report.protection.unlisted_names = {text};
+  report.file_size = 1000;
+  report.chain = {{"key", LinkState::kHolds, text},
+                  {"certificate", LinkState::kBroken, text},
+                  {"manifest", LinkState::kNotReached, text}};
+  report.events = HostileEvents(text);
+  return report;
+}
+
+}  // namespace simulator

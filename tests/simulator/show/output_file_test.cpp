@@ -1,0 +1,97 @@
+#include "simulator/show/output_file.h"
+
+#include <gtest/gtest.h>
+#include <unistd.h>
+
+#include <cerrno>
+
+#include "support/files.h"
+
+using namespace simulator;
+
+namespace {
+
+const OutputKind kList = {"--list", "list", "list:"};
+
+std::optional<std::string> Objection(const std::string& path,
+                                     const std::vector<std::string>& inputs = {}) {
+  return OutputFile(kList, path).Objection(inputs);
+}
+
+bool AreSame(const std::string& one, const std::string& other) {
+  return OutputFile(kList, one).IsSameAs(OutputFile(kList, other));
+}
+
+}  // namespace
+
+TEST(OutputFile, ReplacesAnEarlierOne) {
+  const TempDir folder;
+  const std::string path = folder.Write("list", ToBytes("list: 1, 2, 3"));
+  EXPECT_EQ(Objection(path), std::nullopt);
+  OutputFile file(kList, path);
+  ASSERT_TRUE(file.Open());
+  EXPECT_TRUE(file.Append("a\n"));
+  EXPECT_TRUE(file.Append("b\n"));
+  EXPECT_EQ(ContentOf(path), "a\nb\n");
+}
+
+TEST(OutputFile, ReplacesWhatIsEmptyOrNotThereOrNoFile) {
+  const TempDir folder;
+  EXPECT_EQ(Objection(folder.Write("empty", {})), std::nullopt);
+  EXPECT_EQ(Objection(folder / "none"), std::nullopt);
+  EXPECT_EQ(Objection("/dev/null"), std::nullopt);
+}
+
+TEST(OutputFile, LeavesAnythingElseAlone) {
+  const TempDir folder;
+  for (const char* content : {"PK\3\4 and more than a list begins with", "list", " list:"}) {
+    const std::string path = folder.Write("base.apk", ToBytes(content));
+    EXPECT_EQ(Objection(path), "--list " + path +
+                                   " is there and holds no list of apktoolkit-sim; it is left "
+                                   "alone");
+  }
+}
+
+TEST(OutputFile, LeavesAFileThatIsLookedAtAloneUnderAnyName) {
+  const TempDir folder;
+  const std::string path = folder.Write("list", ToBytes("list:"));
+  const std::string link = folder / "link";
+  ASSERT_EQ(symlink("list", link.c_str()), 0);
+  EXPECT_EQ(Objection(path, {"/nowhere", link}),
+            "--list " + path + " is a file that is to be looked at; it is left alone");
+}
+
+TEST(OutputFile, IsTheSameUnderTwoNames) {
+  const TempDir folder;
+  const std::string path = folder.Write("list", {});
+  const std::string link = folder / "link";
+  const std::string twin = folder / "twin";
+  ASSERT_EQ(symlink("list", link.c_str()), 0);
+  ASSERT_EQ(::link(path.c_str(), twin.c_str()), 0);
+  EXPECT_TRUE(AreSame(path, path));
+  EXPECT_TRUE(AreSame(path, link));
+  EXPECT_TRUE(AreSame(path, twin));
+  EXPECT_TRUE(AreSame(folder / "none", folder / "./none"));
+  EXPECT_FALSE(AreSame(path, folder / "none"));
+  EXPECT_FALSE(AreSame(path, ""));
+  EXPECT_FALSE(AreSame("", ""));
+  EXPECT_FALSE(AreSame("/dev/null", "/dev/null"));
+}
+
+TEST(OutputFile, SaysThatItCannotBeWritten) {
+  OutputFile file(kList, "/nowhere/list");
+  EXPECT_FALSE(file.Open());
+  EXPECT_EQ(file.ErrorText(), "cannot write the list /nowhere/list: No such file or directory");
+  OutputFile full(kList, "/dev/full");
+  ASSERT_TRUE(full.Open());
+  EXPECT_FALSE(full.Append("a\n"));
+  EXPECT_EQ(errno, ENOSPC);
+}
+
+TEST(OutputFile, WithoutANameIsNotWanted) {
+  OutputFile file(kList, "");
+  EXPECT_FALSE(file.IsWanted());
+  EXPECT_EQ(file.Objection({""}), std::nullopt);
+  EXPECT_TRUE(file.Open());
+  EXPECT_TRUE(file.Append("a\n"));
+}

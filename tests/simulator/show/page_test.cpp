@@ -1,0 +1,244 @@
+#include "simulator/show/page.h"
+
+#include <gtest/gtest.h>
+
+#include <regex>
+
+#include "simulator/phone/text.h"
+#include "simulator/show/hostile_report.h"
+#include "simulator/show/page_template.h"
+
+using namespace simulator;
+
+namespace {
+
+std::string PageOf(const std::vector<Report>& reports) {
+  Page page;
+  for (const Report& report : reports) page.Add(report);
+  return page.Html();
+}
+
+std::string PageOf(const Report& report) { return PageOf(std::vector<Report>{report}); }
+
+bool Has(const std::string& page, const std::string& part) {
+  return page.find(part) != std::string::npos;
+}
+
+size_t Count(const std::string& page, const std::string& part) {
+  size_t count = 0;
+  for (size_t at = 0; (at = page.find(part, at)) != std::string::npos; at += part.size()) ++count;
+  return count;
+}
+
+// Everything between "<" and ">": what a browser takes for markup.
+std::vector<std::string> TagsOf(const std::string& page) {
+  static const std::regex kTag("<[^>]*>");
+  return {std::sregex_token_iterator(page.begin(), page.end(), kTag), {}};
+}
+
+Report Example(Verdict verdict) {
+  Report report;
+  report.file = "base.apk";
+  report.path = "/data/app/base.apk";
+  report.verdict = verdict;
+  return report;
+}
+
+Item Library(const std::string& name, const Cause* why) {
+  const ItemState state = why == nullptr ? ItemState::kDone : ItemState::kRefused;
+  return {ItemKind::kLibrary, name, "", state, {why, ""}};
+}
+
+}  // namespace
+
+TEST(Page, SaysWhatTheTerminalSays) {
+  Report report = Example(Verdict::kPartlySigned);
+  report.package_name = "com.example.vault";
+  report.items = {Library("lib/arm/a.so", nullptr),
+                  Library("lib/arm/b.so", &cause::kLibraryChanged),
+                  Library("lib/arm/c.so", &cause::kLibraryChanged)};
+  report.warnings = {{&cause::kSchemesStripped, "v2"}};
+  report.signer.emplace();
+  report.signer->subject = "CN=Vault";
+  report.signer->sha256 = std::string(64, 'c');
+  report.signer->key = {"RSA", 2048, std::string(64, 'a'), std::string(64, 'b'), ""};
+  const std::string page = PageOf(report);
+  for (const char* part :
+       {"<p>1 file: 1 partly signed</p>", "<p class=\"verdict mixed\">PARTLY SIGNED</p>",
+        "<bdi>base.apk</bdi>", "<p class=\"fact\">com.example.vault</p>",
+        "<p class=\"fact\">signer CN=Vault, RSA-2048, key bbbbbbbb…bbbbbb</p>",
+        ">✓</span> <span class=\"name\">lib/arm/a.so</span> <span class=\"outcome\">signed</span>",
+        ">✗</span> <span class=\"name\">lib/arm/b.so</span> <span class=\"outcome\">not signed: "
+        "its bytes are not those that the manifest lists</span>",
+        "</span> the signature file says that the package is signed with v2 as well, and it is "
+        "not: phones do not install it</p>",
+        "<p class=\"cure\">Sign the package again, as the last step that changes it.</p>",
+        "<dt>key size (bits)</dt><dd>2048</dd>"}) {
+    EXPECT_TRUE(Has(page, part)) << part << "\n" << page;
+  }
+  EXPECT_EQ(Count(page, cause::kLibraryChanged.cure), 1U) << "said once for neighbours";
+}
+
+TEST(Page, BeginsAsEveryPageDoes) {
+  EXPECT_EQ(PageOf(Example(Verdict::kSigned)).substr(0, kPageStart.size()), kPageStart);
+}
+
+// Nobody but the reader's own browser is asked for anything, and nothing runs.
+TEST(Page, HasNoScriptAndNothingFromElsewhere) {
+  const std::string page = PageOf(HostileReport("x"));
+  EXPECT_TRUE(Has(page, "content=\"default-src 'none'; style-src 'unsafe-inline'; "));
+  for (const std::string& tag : TagsOf(page)) {
+    EXPECT_FALSE(std::regex_search(tag, std::regex("^<(script|link|img|iframe|object|embed|base)|"
+                                                   " (src|on[a-z]+|srcset|action|data)=")))
+        << tag;
+    EXPECT_EQ(Has(tag, "href="), Has(tag, "href=\"#file-")) << tag;
+  }
+  EXPECT_FALSE(std::regex_search(page, std::regex("@import|https?:|url\\((?!#)")));
+}
+
+// A name with markup in it changes nothing but the texts.
+TEST(Page, HasTheSameMarkupWhateverFilesAreCalled) {
+  const std::string plain = PageOf({HostileReport("x"), HostileReport("x")});
+  const std::string hostile = PageOf({HostileReport(kHostileText), HostileReport(kHostileText)});
+  EXPECT_EQ(TagsOf(hostile), TagsOf(plain));
+  EXPECT_GT(Count(hostile, "&lt;script&gt;"), 70U);
+  EXPECT_TRUE(Has(hostile,
+                  "&quot;&apos;&gt;&lt;a href=&apos;javascript:alert(1)&apos;&gt;"
+                  "&amp;lt;&amp;{{verdict}}{{{verdict}}}{{&amp;verdict}}--&gt;"));
+}
+
+TEST(Page, ShowsAsBytesWhatIsNoTextOrTurnsIt) {
+  std::string page = PageOf(HostileReport(kHostileText));
+  EXPECT_TRUE(
+      Has(page, "\\x1b]0;x\\x07\\x09\\x0a\\x0d\\x7f\\xff\\xc3\\xc2\\x9b\\xd8\\x9c\\xe2\\x80"));
+  for (const char* turned : {"\u009b", "\u061c", "\u200b", "\u202e", "\u2066", "\ufeff"}) {
+    EXPECT_FALSE(Has(page, turned));
+  }
+  for (size_t at = 0; at < page.size();) {
+    const size_t length = Utf8Length(std::string_view(page).substr(at));
+    ASSERT_NE(length, 0U) << "no UTF-8 at " << at;
+    EXPECT_TRUE(length > 1 || page[at] == '\n' || (page[at] >= 0x20 && page[at] < 0x7f)) << at;
+    at += length;
+  }
+}
+
+// {{{name}}} and {{&name}} would let markup through.
+TEST(Page, TemplateEscapesEverything) {
+  EXPECT_FALSE(Has(kPageTemplate, "{{{"));
+  EXPECT_FALSE(std::regex_search(kPageTemplate, std::regex("\\{\\{\\s*[&=>]")));
+  EXPECT_TRUE(Has(kPageTemplate, "{{file}}"));
+}
+
+TEST(Page, FillsInTheWholeTemplate) {
+  const std::string page = PageOf(HostileReport("x"));
+  EXPECT_FALSE(Has(page, "{{"));
+  EXPECT_TRUE(Has(page, "</html>\n"));
+}
+
+TEST(Page, IsBoundedHoweverMuchThereIs) {
+  constexpr size_t kMany = 60'000;
+  const std::string name(1000, '"');
+  Report report = Example(Verdict::kPartlySigned);
+  report.items.assign(kMany, {ItemKind::kLibrary, name, "", ItemState::kDone, {}});
+  report.items.back().state = ItemState::kRefused;
+  report.items.back().reason = {&cause::kToolError, name};
+  report.protection.unlisted = {kMany, 1};
+  report.protection.unlisted_names.assign(kMany, name);
+  std::string journal;
+  for (size_t i = 0; i < kMany; ++i) {
+    journal += Event("verify").Text("path", i % 2 == 0 ? "a" : "b").Number("result", 0).Line();
+  }
+  report.events = ParseEvents(journal);
+  const std::string page = PageOf(report);
+  EXPECT_LT(page.size(), 2U << 20);
+  EXPECT_TRUE(Has(page, "<p class=\"more\">59,800 more; 1 is refused of all</p>"));
+  EXPECT_EQ(Count(page, "<p class=\"more\">59,800 more</p>"), 1U);
+  EXPECT_TRUE(Has(page, "<p class=\"more\">59,800 more; the journal has them all</p>"));
+  EXPECT_EQ(Count(page, "<li class=\"bad\"><span class=\"mark bad\""), 1U)
+      << "a refusal is not left out";
+}
+
+TEST(Page, ShowsAllOfWhatIsNotTooMuch) {
+  Report report = Example(Verdict::kSigned);
+  report.items.assign(kMostPageLines, Library("a", nullptr));
+  report.items.back() = Library(std::string(kMostPageText, 'b'), &cause::kLibraryChanged);
+  const std::string page = PageOf(report);
+  EXPECT_EQ(Count(page, "<span class=\"name\">"), kMostPageLines);
+  EXPECT_TRUE(Has(page, ">" + std::string(kMostPageText, 'b') + "<"));
+  EXPECT_FALSE(Has(page, " more"));
+  EXPECT_LT(page.find(">a<"), page.find(">bbb")) << "in the order of the terminal";
+}
+
+// The euro sign has three bytes.
+TEST(Page, CutsNoCharacterInTwo) {
+  Report report = Example(Verdict::kSigned);
+  for (size_t i = 0; i < 3; ++i) {
+    report.file = std::string(kMostPageText - i, 'a') + "€€";
+    const std::string page = PageOf(report);
+    EXPECT_TRUE(Has(page, ">" + std::string(kMostPageText - i, 'a') + "…<")) << page;
+  }
+  report.file = std::string(kMostPageText - 3, 'a') + "€€";
+  EXPECT_TRUE(Has(PageOf(report), "a€…<"));
+}
+
+TEST(Page, ListsTheFilesWhereThereAreSeveral) {
+  EXPECT_FALSE(Has(PageOf(Example(Verdict::kSigned)), "<nav"));
+  const std::string page = PageOf({Example(Verdict::kRefused), Example(Verdict::kTrustedJar)});
+  EXPECT_TRUE(Has(page, "<p>2 files: 1 trusted JAR, 1 refused</p>"));
+  EXPECT_TRUE(Has(page,
+                  "<li><span class=\"verdict good\">TRUSTED JAR</span> "
+                  "<a class=\"name\" href=\"#file-2\">base.apk</a></li>"));
+  EXPECT_TRUE(Has(page, "<article id=\"file-2\""));
+}
+
+TEST(Page, LeavesOutWhatThereIsNot) {
+  const std::string page = PageOf(Example(Verdict::kNotLookedAt));
+  EXPECT_TRUE(Has(page, "NOT LOOKED AT"));
+  for (const char* part : {"<h3", "<svg class=\"bar\"", "<ol", "<table", "<dl"}) {
+    EXPECT_FALSE(Has(page, part)) << part;
+  }
+}
+
+TEST(Page, DrawsEachPartOfThePackage) {
+  const std::string page = PageOf(HostileReport("x"));
+  EXPECT_TRUE(Has(page,
+                  "verified 30.0 %, listed and not verified 20.0 %, not listed 10.0 %, the "
+                  "signature itself 5.0 %, between the entries 35.0 %</desc>"));
+  EXPECT_EQ(Count(page, "<rect fill=\"url(#unlisted)\" x="), 1U);
+  EXPECT_TRUE(Has(page,
+                  "<td class=\"number\">3</td><td class=\"number\">300</td>"
+                  "<td class=\"number\">30.0</td>"));
+}
+
+TEST(Page, ShowsWhereTheChainBreaks) {
+  const std::string page = PageOf(HostileReport("x"));
+  EXPECT_TRUE(Has(page, "<span class=\"link\">key</span> <span class=\"at\">x</span>"));
+  EXPECT_TRUE(Has(page, "<span class=\"link\">certificate, where it breaks</span>"));
+  EXPECT_TRUE(
+      Has(page, "<span class=\"link\">manifest</span> <span class=\"at\">not reached</span>"));
+}
+
+TEST(Page, TellsSchemesOfOneCertificateTogether) {
+  Report report = Example(Verdict::kSigned);
+  CertificateFacts one;
+  one.sha256 = "1";
+  CertificateFacts other;
+  other.sha256 = "2";
+  report.signer = one;
+  report.newer = {{"v2", one}, {"v3", other}, {"v3", one}};
+  const std::string page = PageOf(report);
+  EXPECT_EQ(Count(page, "<h4>"), 2U);
+  EXPECT_TRUE(Has(page, "<h4>Signed with v1, v2, v3</h4>"));
+  EXPECT_TRUE(Has(page, "<h4>Signed with v3</h4>"));
+}
+
+TEST(Page, SaysOfTheJarSignerAloneThatTheKernelGetsTheKey) {
+  Report report = Example(Verdict::kRefused);
+  CertificateFacts certificate;
+  certificate.key.modulus_sha256 = std::string(64, '0');
+  report.newer = {{"v2", certificate}};
+  report.signer.reset();
+  EXPECT_TRUE(Has(PageOf(report), "0 (of the modulus alone)</dd>"));
+  report.signer = certificate;
+  EXPECT_TRUE(Has(PageOf(report), "0 (of the modulus alone: what the kernel gets)</dd>"));
+}

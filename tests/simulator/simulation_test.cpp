@@ -1,0 +1,264 @@
+// What apktoolkit-sim does with its files, its journal and its page.
+#include <gtest/gtest.h>
+#include <sys/stat.h>
+#include <unistd.h>
+
+#include <filesystem>
+
+#include "simulator/simulated.h"
+
+TEST(Files, AreSetApartAndSummedUp) {
+  const Probe good({"sign 3 0000"});
+  const Probe bad({"verify 3"});
+  const ProcessResult result = Simulated({good.path(), bad.path(), good.path()});
+  EXPECT_NE(result.output.find("\n\nNOT TRUSTED JAR  " + bad.path() + "\n"), std::string::npos)
+      << result.output;
+  EXPECT_EQ(LinesOf(result.output).back(), "3 files: 2 trusted JARs, 1 JAR not trusted");
+}
+
+TEST(Files, AreVerdictsAloneWhenAsked) {
+  const Probe good({"sign 3 0000"});
+  const Probe bad({"verify 3"});
+  EXPECT_EQ(Simulated({"--quiet", good.path(), bad.path()}).output,
+            "TRUSTED JAR  " + good.path() + "\nNOT TRUSTED JAR  " + bad.path() + "\n");
+}
+
+// The first takes longest; what is told keeps the order of the command line.
+TEST(Files, KeepTheirOrderWhenSeveralRunAtATime) {
+  const Probe slow({"sign 3 0000", "sleep 1"});
+  const Probe quick({"verify 3"});
+  const Lines files = {slow.path(), quick.path(), quick.path(), quick.path()};
+  const TempDir folder;
+  const std::string journal = folder / "journal";
+  Lines words = {"--jobs", "4", "--quiet", "--journal", journal};
+  words.insert(words.end(), files.begin(), files.end());
+  const ProcessResult result = Simulated(words);
+  EXPECT_EQ(LinesOf(result.output),
+            Lines({"TRUSTED JAR  " + slow.path(), "NOT TRUSTED JAR  " + quick.path(),
+                   "NOT TRUSTED JAR  " + quick.path(), "NOT TRUSTED JAR  " + quick.path()}));
+  Lines started;
+  std::string last_event;
+  for (const Json& event : ParseJournal(ContentOf(journal))) {
+    if (event["event"] == "start") {
+      EXPECT_TRUE(started.empty() || last_event == "verdict") << "runs are not mixed";
+      started.push_back(event["file"]);
+    }
+    last_event = event["event"];
+  }
+  EXPECT_EQ(started, files);
+}
+
+// Whoever looks at a pipe sees no line that is overwritten.
+TEST(Files, ShowNoProgressWithoutATerminal) {
+  const Probe slow({"sign 3 0000", "sleep 2"});
+  EXPECT_EQ(Simulated({slow.path()}).errors, "");
+}
+
+// util-linux's script gives it a terminal.
+TEST(Files, ShowProgressOnATerminalWhenItTakesLonger) {
+  if (RunProcess({"script", "-qec", "true", "/dev/null"}).status != 0) {
+    GTEST_SKIP() << "there are no pseudo-terminals here: /dev/pts is not mounted";
+  }
+  const Probe slow({"sign 3 0000", "sleep 2"});
+  const ProcessResult result = RunProcess(
+      {"script", "-qec", SimulatorPath() + " --quiet --tool " + PROBE_PATH + " " + slow.path(),
+       "/dev/null"});
+  const size_t progress = result.output.find("0 of 1 done; " + slow.path() + ": 1 s");
+  EXPECT_NE(progress, std::string::npos) << result.output;
+  // It is gone before the verdict comes.
+  const size_t verdict = result.output.find("\r\x1b[K\x1b[32mTRUSTED JAR", progress);
+  EXPECT_NE(verdict, std::string::npos) << result.output;
+}
+
+TEST(Interruption, EndsTheToolAndTheSimulatorByTheSignal) {
+  const Probe slow({"sign 3 0000", "sleep 60"});
+  const ProcessResult result = InShell("\"$@\" & sleep 1; kill -TERM $!; wait $!", {slow.path()});
+  EXPECT_EQ(result.status, 128 + 15);
+}
+
+// Names may come from whoever made the files.
+TEST(Files, NamesReachNoTerminalAsTheyAre) {
+  const TempDir folder;
+  const std::string odd = folder.Write("-\x1b]0;x\x07", ToBytes("sign 3 0000\n"));
+  for (const Lines& words :
+       {Lines({odd}), Lines({"-\x1b]0;x\x07"}), Lines({"--journal", odd, odd})}) {
+    const ProcessResult result = Simulated(words);
+    EXPECT_EQ((result.output + result.errors).find('\x1b'), std::string::npos) << result.output;
+    EXPECT_NE((result.output + result.errors).find("\\x1b"), std::string::npos) << result.output;
+  }
+}
+
+TEST(Journal, StartsWithTheVersionTheFileAndTheProcess) {
+  const TempDir folder;
+  const std::string file = folder.Write("script", ToBytes("sign 3 0000\n"));
+  const ProcessResult result =
+      RunProcess({SimulatorPath(), "--json", "--tool", PROBE_PATH, "./script"}, folder.path());
+  std::vector<Json> events = ParseJournal(result.output);
+  ASSERT_EQ(events.size(), 6U);
+  EXPECT_EQ(LinesOf(result.output)[0], "{\"event\":\"journal\",\"version\":1}");
+  EXPECT_EQ(events[1], Json({{"event", "start"}, {"file", "./script"}, {"path", file}}));
+  EXPECT_GT(events[2]["pid"], 1);
+  EXPECT_EQ(events[3]["event"], "sign");
+  EXPECT_EQ(LinesOf(result.output)[4], "{\"event\":\"exit\",\"status\":0}");
+  EXPECT_EQ(events[5]["event"], "verdict");
+}
+
+TEST(Journal, IsKeptInAFileAnew) {
+  const Probe probe({"sign 3 0000"});
+  const std::string before = "{\"event\":\"journal\",\"version\":1}\n{\"event\":\"old\"}\n";
+  const std::string file = probe.folder().Write("journal", ToBytes(before));
+  const ProcessResult kept = Simulated({"--journal", file, probe.path()});
+  EXPECT_EQ(LinesOf(kept.output)[0], "TRUSTED JAR  " + probe.path());
+  const ProcessResult both = Simulated({"--json", "--journal", file, probe.path()});
+  EXPECT_EQ(ContentOf(file), both.output);
+  EXPECT_EQ(ParseJournal(both.output).size(), 6U);
+}
+
+TEST(Journal, FileNamesAreBytes) {
+  const TempDir folder;
+  const std::string odd = folder.Write("od\xe9\n\"d", ToBytes("sign 3 0000\n"));
+  const ProcessResult result = Simulated({"--json", odd});
+  EXPECT_EQ(result.status, 0);
+  const std::vector<Json> events = ParseJournal(result.output);
+  ASSERT_EQ(events.size(), 6U);
+  EXPECT_EQ(events[3]["path"], folder / "od\uf7e9\n\"d");
+}
+
+TEST(Page, IsWrittenAnewForAllFilesInTheirOrder) {
+  const Probe good({"sign 3 0000", "sleep 1"});
+  const Probe bad({"verify 3"});
+  const std::string page = good.folder() / "page.html";
+  ASSERT_EQ(Simulated({"--html", page, bad.path()}).status, 1);
+  const ProcessResult result =
+      Simulated({"--html", page, "--quiet", "--jobs", "3", good.path(), bad.path(), good.path()});
+  EXPECT_EQ(result.status, 1);
+  const std::string text = ContentOf(page);
+  EXPECT_NE(text.find("<p>3 files: 2 trusted JARs, 1 JAR not trusted</p>"), std::string::npos);
+  const size_t first = text.find("<h2 id=\"name-1\"><bdi>" + good.path() + "<");
+  const size_t second = text.find("<h2 id=\"name-2\"><bdi>" + bad.path() + "<");
+  const size_t third = text.find("<h2 id=\"name-3\"><bdi>" + good.path() + "<");
+  EXPECT_TRUE(first < second && second < third && third != std::string::npos) << text;
+}
+
+TEST(Page, OfAnInterruptedRunHasWhatWasDone) {
+  const Probe good({"sign 3 0000"});
+  const Probe slow({"sign 3 0000", "sleep 60"});
+  const std::string page = good.folder() / "page.html";
+  const ProcessResult result = InShell("\"$@\" & sleep 1; kill -TERM $!; wait $!",
+                                       {"--html", page, good.path(), slow.path()});
+  EXPECT_EQ(result.status, 128 + 15);
+  EXPECT_NE(ContentOf(page).find("<bdi>" + good.path() + "</bdi>"), std::string::npos);
+  EXPECT_NE(ContentOf(page).find("</html>\n"), std::string::npos);
+}
+
+TEST(Simulation, FollowsLinksToTheFile) {
+  const Probe probe({"sign 3 0000"});
+  const std::string link = probe.folder() / "link";
+  ASSERT_EQ(symlink("script", link.c_str()), 0);
+  EXPECT_EQ(Simulated({link}).status, 0);
+}
+
+TEST(Simulation, WorksFromAFolderThatTheLoaderCannotName) {
+  if (AreProgramsEmulated()) GTEST_SKIP() << "the copies cannot be started by themselves";
+  namespace fs = std::filesystem;
+  const TempDir folder;
+  const std::string place = folder / "with space: and colon";
+  const fs::path built = fs::path(SimulatorPath()).parent_path().parent_path();
+  fs::create_directories(place + "/bin");
+  fs::create_directories(place + "/lib");
+  fs::copy(built / "lib/apktoolkit", place + "/lib/apktoolkit");
+  for (const char* name : {"apktoolkit-sim", "simulator_probe"}) {
+    fs::copy(built / "bin" / name, place + "/bin/" + name);
+  }
+  const Probe probe({"sign 3 0000", "register 3 name ab"});
+  const ProcessResult result = RunProcess({"env", "LC_ALL=C", place + "/bin/apktoolkit-sim",
+                                           "--tool", place + "/bin/simulator_probe", probe.path()});
+  EXPECT_EQ(result.status, 0) << result.errors;
+  EXPECT_EQ(FirstLines(result, 3),
+            Lines({"TRUSTED JAR  " + probe.path(), "  + JAR  signed, without data",
+                   "  + key  registered for name"}));
+}
+
+TEST(Simulation, RunnerGetsThePreloadForTheTool) {
+  if (AreProgramsEmulated()) GTEST_SKIP() << "there is a runner already";
+  const Probe probe({"sign 3 0000"});
+  // Does what an emulator does with -E, and tells what it was given itself.
+  const std::string runner =
+      probe.folder().Write("runner", ToBytes("#!/bin/sh\n"
+                                             "echo \"$1 $2 ${3%%=*} preload=$LD_PRELOAD\" >&2\n"
+                                             "shift 2\n"
+                                             "exec env \"$@\"\n"));
+  ASSERT_EQ(chmod(runner.c_str(), 0755), 0);
+  const ProcessResult result = Simulated({"--runner", runner + " --flag", probe.path()});
+  EXPECT_EQ(result.errors, "--flag -E LD_PRELOAD preload=\n");
+  EXPECT_EQ(result.status, 0);
+}
+
+TEST(Simulation, HandsNoOpenFileOfTheCallersToTheTool) {
+  const Probe probe({"sign 3 0000"});
+  const ProcessResult result =
+      RunProcess({"bash", "-c", "exec 3</dev/null 7</dev/null; exec \"$@\"", "bash",
+                  SimulatorPath(), "--json", "--tool", PROBE_PATH, probe.path()});
+  // The probe opens its file first, as the tool does.
+  const std::vector<Json> events = OfKind(ParseJournal(result.output), "sign");
+  ASSERT_EQ(events.size(), 1U);
+  EXPECT_EQ(events[0]["path"], probe.path());
+  EXPECT_EQ(result.status, 0) << result.errors;
+}
+
+TEST(State, WhatWasSignedStaysTrustedWhileItsBytesStayTheSame) {
+  const TempDir state;
+  const Probe jar({"verify 3", "sign 3 0000"});
+  EXPECT_EQ(jar.Run({"--state", state.path()}).status, 1);
+  EXPECT_EQ(jar.Run({"--state", state.path()}).status, 0);
+  // One byte changed.
+  jar.folder().Write("script", ToBytes("verify 3\nsign 3 0001\n"));
+  EXPECT_EQ(jar.Run({"--state", state.path()}).results[0], "-1 126");
+}
+
+TEST(State, WhatWasNotSignedIsNotTrusted) {
+  const TempDir state;
+  const Probe jar({"verify 3", "sign 3 0000"});
+  EXPECT_EQ(jar.Run({"--state", state.path(), "--sign-errno", "EPERM"}).status, 1);
+  EXPECT_EQ(jar.Run({"--state", state.path()}).results[0], "-1 126");
+}
+
+TEST(State, LastsForTheFilesOfOneRunWithoutADirectory) {
+  const Probe jar({"verify 3", "sign 3 0000"});
+  const ProcessResult result = Simulated({"--json", jar.path(), jar.path()});
+  const std::vector<Json> verified = OfKind(ParseJournal(result.output), "verify");
+  ASSERT_EQ(verified.size(), 2U);
+  EXPECT_EQ(verified[0]["result"], -1);
+  EXPECT_EQ(verified[1]["result"], 0);
+}
+
+TEST(State, IsNotSharedWhenSeveralFilesRunAtATime) {
+  const Probe jar({"verify 3", "sign 3 0000"});
+  const ProcessResult result = Simulated({"--jobs", "2", "--json", jar.path(), jar.path()});
+  const std::vector<Json> verified = OfKind(ParseJournal(result.output), "verify");
+  ASSERT_EQ(verified.size(), 2U);
+  EXPECT_EQ(verified[0]["result"], -1);
+  EXPECT_EQ(verified[1]["result"], -1);
+}
+
+TEST(Tool, RunsAsItIsOnAFileThatIsNoZip) {
+  const TempDir folder;
+  const std::string file = folder.Write("note.txt", ToBytes("hello\n"));
+  const ProcessResult result = Told({file});
+  EXPECT_EQ(result.status, 1);
+  EXPECT_EQ(result.errors, "");
+  EXPECT_EQ(result.output, "REFUSED  " + file +
+                               "\n"
+                               "  ✗ file  not signed: it is a text and not an archive\n"
+                               "      Look into it: a failed download leaves its message so.\n"
+                               "   1  error      OpenArchiveFd(3) [file: " +
+                               file +
+                               "] returned: -3: Invalid file\n"
+                               "   2  log        VeltSignJni starts: 3.\n"
+                               "   3  error      VeltSignJni: malformed apk: " +
+                               file +
+                               "\n"
+                               "   4  log        VeltSign starts: zip_fd = 3, fd = 3.\n"
+                               "   5  error      Zip archive is not valid for fd=3\n"
+                               "   6  exit       status 0\n");
+}

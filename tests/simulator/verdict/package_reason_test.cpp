@@ -1,0 +1,180 @@
+#include "simulator/verdict/package_reason.h"
+
+#include <gtest/gtest.h>
+
+#include "simulator/phone/probe_run.h"
+
+using namespace simulator;
+
+namespace {
+
+RunRecord After(const Lines& errors) {
+  RunRecord run;
+  run.opening_errors = errors;
+  return run;
+}
+
+std::string Code(const Reason& reason) {
+  return reason.detail.empty() ? reason.cause->code
+                               : std::string(reason.cause->code) + " " + reason.detail;
+}
+
+std::string Why(const Lines& errors, const PackageFacts& facts) {
+  return Code(WhyRefused(After(errors), facts));
+}
+
+// A package whose signature reads.
+PackageFacts Signed() {
+  PackageFacts facts;
+  facts.kind = FileKind::kArchive;
+  facts.archive_result = 0;
+  facts.jar.has_manifest = facts.jar.can_read_manifest = facts.jar.has_manifest_digest = true;
+  facts.jar.signature_files = {"META-INF/CERT.SF"};
+  facts.jar.block_name = "META-INF/CERT.RSA";
+  facts.jar.block_is_whole = true;
+  facts.jar.digest = "SHA-256";
+  facts.jar.certificate.emplace();
+  facts.jar.certificate->is_self_issued = true;
+  facts.jar.certificate->signature_algorithm = "SHA256withRSA";
+  facts.jar.certificate->key.algorithm = "RSA";
+  facts.jar.certificate->key.bits = 2048;
+  facts.jar.certificate->key.exponent = std::string("\1\0\1", 3);
+  return facts;
+}
+
+PackageFacts WithExponent(const std::string& exponent) {
+  PackageFacts facts = Signed();
+  facts.jar.certificate->key.exponent = exponent;
+  return facts;
+}
+
+}  // namespace
+
+TEST(WhyRefused, OfADexFileTheLinesBeforeItTell) {
+  RunRecord run;
+  run.is_dex_refused = true;
+  EXPECT_EQ(Code(WhyRefused(run, Signed())), "dex-changed");
+  run.dex_errors = {"Can't find file in META-INF/MANIFEST.MF: classes.dex"};
+  EXPECT_EQ(Code(WhyRefused(run, Signed())), "dex-not-listed");
+  run.dex_errors = {"verifyData: Unsupported digest type: MD5-Digest"};
+  EXPECT_EQ(Code(WhyRefused(run, Signed())), "dex-digest");
+}
+
+TEST(WhyRefused, OfWhatTheZipLibraryDoesNotOpenTheKindOfFileTells) {
+  const auto why = [](FileKind kind) {
+    PackageFacts facts;
+    facts.kind = kind;
+    return Why({"OpenArchiveFd(3) [file: a] returned: -3: Invalid file"}, facts);
+  };
+  EXPECT_EQ(why(FileKind::kFolder), "folder");
+  EXPECT_EQ(why(FileKind::kSpecial), "special-file");
+  EXPECT_EQ(why(FileKind::kEmpty), "empty-file");
+  EXPECT_EQ(why(FileKind::kText), "text-file");
+  EXPECT_EQ(why(FileKind::kCutArchive), "cut-archive");
+  EXPECT_EQ(why(FileKind::kNoArchive), "no-archive");
+  EXPECT_EQ(why(FileKind::kArchive), "damaged-archive");
+  EXPECT_EQ(Why({"OpenArchiveFd(3) [file: a] returned: -6: Empty archive"}, Signed()),
+            "empty-archive");
+}
+
+TEST(WhyRefused, WithoutARsaBlockTheOneThatIsThereTells) {
+  const Lines errors = {"Can't extract RSA certificate: META-INF/CERT.RSA"};
+  PackageFacts facts = Signed();
+  EXPECT_EQ(Why(errors, facts), "signature-block-unreadable META-INF/CERT.RSA");
+  facts.jar.block_name = "";
+  EXPECT_EQ(Why(errors, facts), "signature-block-missing META-INF/CERT.RSA");
+  facts.jar.block_name = "META-INF/CERT.EC";
+  EXPECT_EQ(Why(errors, facts), "ec-key");
+  facts.jar.block_name = "META-INF/CERT.DSA";
+  facts.jar.certificate->key.algorithm = "DSA";
+  EXPECT_EQ(Why(errors, facts), "dsa-key");
+}
+
+TEST(WhyRefused, BlockThatDoesNotParseMayBeOfAnotherKey) {
+  const Lines errors = {"Unknown certificate type", "file not verified: META-INF/CERT.SF"};
+  PackageFacts facts = Signed();
+  EXPECT_EQ(Why(errors, facts), "signature-block-malformed META-INF/CERT.RSA");
+  facts.jar.certificate->key.algorithm = "EC";
+  EXPECT_EQ(Why(errors, facts), "ec-key");
+}
+
+// The tool takes the exponent's first four bytes for a number with the lowest byte first.
+TEST(WhyRefused, KeyThatCannotBeSetHasAnExponentThatIsReadAsOne) {
+  const Lines errors = {"RSA could not set key: 5", "file not verified: META-INF/CERT.SF"};
+  EXPECT_EQ(Why(errors, WithExponent("\1")), "exponent-refused 1");
+  EXPECT_EQ(Why(errors, WithExponent(std::string("\1\0\0\0", 4))),
+            "exponent-refused 0x01000000, which is read as 1");
+  EXPECT_EQ(Why(errors, WithExponent("\xff\xff\xff\xff")),
+            "exponent-refused 0xffffffff, which is read as 1");
+  EXPECT_EQ(Why(errors, Signed()), "signature-block-malformed META-INF/CERT.RSA");
+  EXPECT_EQ(Why({"RSA could not set key: 9"}, Signed()), "no-memory");
+}
+
+TEST(WhyRefused, OfACertificate) {
+  const Lines errors = {"RSA could not verify certificate: 7"};
+  PackageFacts facts = Signed();
+  EXPECT_EQ(Why(errors, facts), "certificate-changed");
+  facts.jar.certificate->signature_algorithm = "SHA384withRSA";
+  EXPECT_EQ(Why(errors, facts), "certificate-digest SHA384withRSA");
+  facts.jar.certificate->is_self_issued = false;
+  facts.jar.certificate->issuer = "CN=Authority";
+  EXPECT_EQ(Why(errors, facts), "certificate-issued CN=Authority");
+  facts.jar.certificate->key.bits = 4097;
+  EXPECT_EQ(Why(errors, facts), "key-too-large 4097");
+  facts.jar.certificate->key.bits = 127;
+  EXPECT_EQ(Why(errors, facts), "key-too-small 127");
+  EXPECT_EQ(Why({"RSA could not verify certificate: 11"}, facts), "no-memory");
+}
+
+TEST(WhyRefused, OfASignature) {
+  const Lines errors = {"RSA could not verify data: 7"};
+  PackageFacts facts = Signed();
+  EXPECT_EQ(Why(errors, facts), "signature-wrong META-INF/CERT.RSA");
+  EXPECT_EQ(Why({"SHA256 hash does not match", "RSA could not verify data: 12"}, facts),
+            "signature-file-changed META-INF/CERT.SF");
+  EXPECT_EQ(Why({"SHA hash check unsuccessfull", "RSA could not verify data: 12"}, facts),
+            "signature-file-changed META-INF/CERT.SF");
+  facts.jar.digest = "SHA-512";
+  EXPECT_EQ(Why(errors, facts), "signature-digest SHA-512");
+  facts.jar.signature_algorithm = "RSASSA-PSS";
+  EXPECT_EQ(Why(errors, facts), "signature-digest RSASSA-PSS");
+  facts.jar.has_signed_attributes = true;
+  EXPECT_EQ(Why(errors, facts), "signed-attributes");
+  EXPECT_EQ(Why({"RSA could not verify data: 11"}, facts), "no-memory");
+}
+
+TEST(WhyRefused, OfAManifest) {
+  PackageFacts facts = Signed();
+  EXPECT_EQ(Why({"Can't validate manifest.", "Can't validate manifest."}, facts),
+            "manifest-changed");
+  EXPECT_EQ(
+      Why({"verifyData: Unsupported digest type: MD5-Digest", "Can't validate manifest."}, facts),
+      "manifest-digest");
+  facts.jar.has_manifest_digest = false;
+  EXPECT_EQ(Why({"Can't validate manifest."}, facts), "manifest-digest");
+  const std::string parse = "Parse manifest: Error: P_KEY: unexpected end of file after key 'x'";
+  EXPECT_EQ(Why({parse, "Can't load manifest: size=3"}, facts), "manifest-malformed");
+  EXPECT_EQ(Why({parse}, facts), "signature-file-malformed META-INF/CERT.SF");
+  EXPECT_EQ(Why({"ParseAndroidManifest failed to init xml parser, error=0x80000000",
+                 "Can't process Android Manifest."},
+                facts),
+            "android-manifest-text");
+}
+
+TEST(WhyRefused, OfWhatTheToolDoesNotMentionThePackageTells) {
+  PackageFacts facts = Signed();
+  EXPECT_EQ(Why({}, facts), "signature-file-unreadable META-INF/CERT.SF");
+  facts.jar.signature_files.clear();
+  EXPECT_EQ(Why({}, facts), "signature-file-missing");
+  facts.jar.can_read_manifest = false;
+  EXPECT_EQ(Why({}, facts), "manifest-unreadable");
+  facts.jar.has_manifest = false;
+  EXPECT_EQ(Why({}, facts), "unsigned");
+  facts.newer = {{"v2", {}}, {"v3", {}}};
+  EXPECT_EQ(Why({}, facts), "newer-scheme-only v2, v3");
+  EXPECT_EQ(Why({}, PackageFacts()), "damaged-archive");
+}
+
+TEST(WhyRefused, ErrorThatIsNotKnownIsQuoted) {
+  EXPECT_EQ(Why({"something new"}, Signed()), "tool-error something new");
+}
