@@ -13,6 +13,24 @@ set(CMAKE_CXX_FLAGS_RELEASE "-O2")
 add_compile_options(-Wall -Wextra -Werror)
 set(APKTOOLKIT_TOOL_OPTIONS -fno-exceptions -fno-rtti -Wconversion)
 
+# What the platform hardens its own programs with. Symbols are bound before the program starts, and
+# their table is read-only then; programs lie anywhere in memory; the stack is protected; calls are
+# checked where the compiler knows how much room there is; on 64-bit Arm so are jumps and returns.
+# scripts/check-binary looks for all of it in what was made.
+option(APKTOOLKIT_HARDEN "Harden programs and libraries as the platform does" ON)
+if(APKTOOLKIT_HARDEN)
+  include(CheckPIESupported)
+  check_pie_supported(LANGUAGES CXX)
+  add_link_options(LINKER:-z,relro,-z,now)
+  add_compile_options(-fstack-protector-strong)
+  if(NOT CMAKE_CXX_FLAGS MATCHES _FORTIFY_SOURCE)
+    add_compile_definitions(_FORTIFY_SOURCE=2)
+  endif()
+  if(CMAKE_SYSTEM_PROCESSOR STREQUAL aarch64)
+    add_compile_options(-mbranch-protection=standard)
+  endif()
+endif()
+
 set(APKTOOLKIT_SANITIZE "" CACHE STRING
   "Sanitizers that everything is built with, as -fsanitize= takes them (empty: none)")
 if(APKTOOLKIT_SANITIZE)
