@@ -94,12 +94,20 @@ def run_problems():
                      "    skipped A.B: no kernel",
                      "    FAILED A.C: one",
                      "    1 passed",
-                     "steps: 2 passed, 2 failed"], 1)
+                     "steps: 2 passed, 2 failed, 0 skipped"], 1)
         problems = [] if found == expected else [f"scripts/check ends with {found}"]
         if (found := check(folder, "arrows"))[1] != 0:
             problems.append(f"scripts/check does not pass: {found}")
         if (found := check(folder, "arrow"))[1] != 2:
             problems.append(f"scripts/check takes a step that there is not: {found}")
+        write(folder / "scripts/bare-system", "echo on its way; echo skipped: no root; exit 77")
+        skipped = ["debian13      skipped: no root (N s, build/logs/debian13.log)"]
+        found = check(folder, "debian13", "arrows")
+        if found != (skipped + expected[0][:1] + ["steps: 1 passed, 0 failed, 1 skipped"], 0):
+            problems.append(f"scripts/check takes a skipped step for another: {found}")
+        found = check(folder, "debian13")
+        if found != (skipped + ["steps: 0 passed, 0 failed, 1 skipped"], 1):
+            problems.append(f"scripts/check passes where no step ran: {found}")
         write(folder / "scripts/setup", "exit 1")
         if (found := check(folder, "arrows"))[1] == 0:
             problems.append(f"scripts/check goes on without its packages: {found}")
