@@ -2,6 +2,9 @@
 // tool here (CMakeLists.txt names them as the compiler does) and they go on to the library.
 #include <gtest/gtest.h>
 
+#include <algorithm>
+#include <vector>
+
 #include "apk/zip_library.h"
 #include "sign/signing.h"
 #include "support/log_capture.h"
