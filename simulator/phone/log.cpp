@@ -64,8 +64,8 @@ STAND_IN int __android_log_buf_print(int, int priority, const char* tag, const c
   return result;
 }
 
-// The platform's C++ libraries, the zip library among them, write their warnings through one of these
-// two: each generation of the log library has its own.
+// The platform's C++ libraries, the zip library among them, write their warnings through one of
+// these two: each generation of the log library has its own.
 STAND_IN void __android_log_write_logger_data(__android_logger_data* data, const char* text) {
   ReadLogRecord(data, text, Log);
 }

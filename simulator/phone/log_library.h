@@ -1,9 +1,9 @@
 // The platform's log library, as the simulator stands in for it.
 //
 // Two generations of it are in use: up to API level 29 a writer hands a record over as an
-// `__android_logger_data` with the text beside it, later as an `__android_log_message`, which has the
-// text inside. Only this file sees the difference. Texts and records are the caller's; they are read
-// during the call alone.
+// `__android_logger_data` with the text beside it, later as an `__android_log_message` with the
+// text inside. Only this file sees the difference. Texts and records belong to the caller, and are
+// read during the call alone.
 #pragma once
 
 #include <android/log.h>

@@ -94,8 +94,7 @@ TEST_F(Reason, CertificateThatAnAuthorityIssued) {
                    "another (CN=rsa-2048, O=Example), and this tool takes self-signed "
                    "ones alone",
                    "      Sign it with a self-signed certificate: keytool -genkeypair -keyalg RSA",
-                   "      -sigalg SHA256withRSA.",
-                   "-> 1"}));
+                   "      -sigalg SHA256withRSA.", "-> 1"}));
 }
 
 TEST_F(Reason, EcKey) {
@@ -114,18 +113,19 @@ TEST_F(Reason, KeyOfMoreThan4096Bits) {
                             "      Sign it with an RSA key of 2048 to 4096 bits.", "-> 1"}));
 }
 
-// Every keytool signs the certificate of a key of this size with SHA-384 unless it is told otherwise,
-// and what the cure says helps.
+// Every keytool signs the certificate of a key of this size with SHA-384 unless it is told
+// otherwise, and what the cure says helps.
 TEST_F(Reason, CertificateSignedWithALongerDigest) {
   Take("keytool-sha384");
   const Lines told = Told(5);
-  EXPECT_EQ(Lines(told.begin() + 1, told.end()),
-            Lines({"  ✗ package                not signed: its certificate is signed with "
-                   "SHA384withRSA, and this tool reads MD5, SHA-1 and SHA-256 with RSA",
-                   "      Make a certificate for the same key with SHA-256: keytool -selfcert",
-                   "      -sigalg SHA256withRSA. Without -sigalg keytool takes SHA-384: that of JDK",
-                   "      21 for every RSA key, that of JDK 17 for keys of more than 3072 bits.",
-                   "-> 1"}));
+  EXPECT_EQ(
+      Lines(told.begin() + 1, told.end()),
+      Lines({"  ✗ package                not signed: its certificate is signed with "
+             "SHA384withRSA, and this tool reads MD5, SHA-1 and SHA-256 with RSA",
+             "      Make a certificate for the same key with SHA-256: keytool -selfcert",
+             "      -sigalg SHA256withRSA. Without -sigalg keytool takes SHA-384: that of JDK",
+             "      21 for every RSA key, that of JDK 17 for keys of more than 3072 bits.",
+             "-> 1"}));
   EXPECT_EQ(FirstLines(0, {"base.apk"}, {{}, std::string(GOLDEN_PACKAGES) + "/keytool-sha256"}),
             Lines({"-> 0"}));
 }
