@@ -2,6 +2,7 @@
 """Holds the steps of scripts/check against what the papers say of them, and has scripts/check run
 steps that pass, fail and skip."""
 
+import os
 import pathlib
 import re
 import shutil
@@ -114,5 +115,24 @@ def run_problems():
     return problems
 
 
+def skip_problems():
+    """scripts/bare-system says why it cannot be run here, and by its status that it was not."""
+    with tempfile.TemporaryDirectory() as name:
+        folder = pathlib.Path(name)
+        (folder / "scripts").mkdir()
+        shutil.copy(ROOT / "scripts/bare-system", folder / "scripts")
+        write(folder / "wget", "exit 4")
+        reasons = [("exit 1", "debootstrap is not there, and cannot be installed"),
+                   ("true", "there is no http://mirror.invalid/debian/dists/trixie/Release to be had")]
+        for setup, reason in reasons:
+            write(folder / "scripts/setup", setup)
+            expected = reason if os.geteuid() == 0 else "a bare system can be made by root alone"
+            run = subprocess.run([folder / "scripts/bare-system", "13"], capture_output=True, text=True,
+                                 env={**os.environ, "PATH": f"{folder}:{os.environ['PATH']}",
+                                      "DEBIAN_MIRROR": "http://mirror.invalid/debian"}, check=False)
+            if (run.returncode, run.stdout) != (77, f"skipped: {expected}\n"):
+                yield f"scripts/bare-system ends with {run.returncode}: {run.stdout}{run.stderr}"
+
+
 if __name__ == "__main__":
-    sys.exit(report(list_problems() + setup_problems() + run_problems()))
+    sys.exit(report(list_problems() + setup_problems() + run_problems() + list(skip_problems())))
