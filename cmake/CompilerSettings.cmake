@@ -1,6 +1,6 @@
 # The language level and the warnings that every target is built with, and what the tool's own code
-# is held to on top of them. Warnings are errors in the developers' presets alone: a compiler that is
-# younger than this code must not keep anybody from packaging it.
+# is held to on top of them. Warnings are errors in the developers' presets alone: a new warning of a
+# newer compiler must not stop a build of the packages.
 set(CMAKE_CXX_STANDARD 17)
 set(CMAKE_CXX_STANDARD_REQUIRED ON)
 set(CMAKE_CXX_EXTENSIONS OFF)
