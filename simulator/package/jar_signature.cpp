@@ -1,0 +1,115 @@
+#include "simulator/package/jar_signature.h"
+
+#include <openssl/bn.h>
+
+#include <cstring>
+
+#include "apk/apk.h"
+#include "apk/manifest_mf.h"
+#include "crypto/asn1.h"
+#include "crypto/pkcs7.h"
+#include "crypto/rsa.h"
+#include "simulator/package/signature_block.h"
+
+namespace simulator {
+
+namespace {
+
+using Bytes = std::vector<uint8_t>;
+
+void ReadSignatureFile(Bytes text, JarSignatureFacts* jar);
+void FindBlock(const Archive& archive, JarSignatureFacts* jar);
+void ReadBlock(const Bytes& block, JarSignatureFacts* jar);
+std::optional<ToolKey> ReadToolKey(const Bytes& block, const pkcs7& record);
+bool IsCertificateAt(std::string_view certificate, const uint8_t* tbs);
+std::string_view ToView(const uint8_t* bytes, size_t size);
+
+}  // namespace
+
+JarSignatureFacts ReadJarSignature(const Archive& archive, std::vector<std::string>* too_long) {
+  JarSignatureFacts jar;
+  const auto read = [&](const std::string& name, Bytes* content) {
+    const Archive::ReadResult result = archive.Read(name, content);
+    if (result == Archive::ReadResult::kTooLong) too_long->push_back(name);
+    return result == Archive::ReadResult::kRead;
+  };
+  jar.signature_files = archive.Walk(kSignatureFileNames).names;
+  if (jar.signature_files.empty()) return jar;
+  Bytes content;
+  if (read(jar.signature_files[0], &content)) ReadSignatureFile(std::move(content), &jar);
+  FindBlock(archive, &jar);
+  if (jar.has_block && read(jar.block_name, &content)) ReadBlock(content, &jar);
+  return jar;
+}
+
+namespace {
+
+void ReadSignatureFile(Bytes text, JarSignatureFacts* jar) {
+  ManifestMf signature_file;
+  signature_file.load(std::move(text));
+  const ManifestMf::Sections& sections = signature_file.getSections();
+  if (sections.size() > 0) jar->claimed_schemes = sections[0].find("X-Android-APK-Signed");
+  for (const ManifestMf::Section& section : sections) {
+    const bool has_one = !section.findLastEndingIn("-Digest-Manifest").first.empty();
+    jar->has_manifest_digest = jar->has_manifest_digest || has_one;
+  }
+}
+
+void FindBlock(const Archive& archive, JarSignatureFacts* jar) {
+  const std::string name = ApkTools::SignatureBlockName(jar->signature_files[0]);
+  const std::string base = name.substr(0, name.rfind('.') + 1);
+  jar->block_name = name;
+  for (const std::string& candidate : {name, base + "EC", base + "DSA"}) {
+    if (jar->has_block) break;
+    jar->has_block = archive.Has(candidate);
+    if (jar->has_block) jar->block_name = candidate;
+  }
+}
+
+void ReadBlock(const Bytes& block, JarSignatureFacts* jar) {
+  const SignatureBlockFacts strict = ParseSignatureBlock(ToView(block.data(), block.size()));
+  jar->block_is_whole = strict.is_whole;
+  jar->signer_count = strict.signer_count;
+  jar->has_signed_attributes = strict.has_signed_attributes;
+  jar->digest = strict.digest;
+  jar->has_known_digest = strict.has_known_digest;
+  jar->has_pss = strict.has_pss;
+  pkcs7 record = {};
+  const bool is_read = processCert(block.data(), static_cast<uint32_t>(block.size()), &record) == 0;
+  if (is_read) jar->key = ReadToolKey(block, record);
+  if (is_read && !IsCertificateAt(strict.certificate, record.tbs_data)) return;
+  jar->certificate = ParseCertificate(strict.certificate);
+  jar->names_other_certificate = jar->certificate && strict.is_whole &&
+                                 strict.signer_id != jar->certificate->issuer_and_serial &&
+                                 strict.signer_id != jar->certificate->key_id;
+}
+
+// None where the key ends beyond the block: the tool does not take it then.
+std::optional<ToolKey> ReadToolKey(const Bytes& block, const pkcs7& record) {
+  const auto room = static_cast<size_t>(block.data() + block.size() - record.modulus);
+  if (record.modulus > block.data() + block.size() || record.modulus_length > room) return {};
+  ToolKey key;
+  key.modulus_sha256 = Sha256Hex(ToView(record.modulus, record.modulus_length));
+  key.size = record.modulus_length;
+  memcpy(&key.exponent, record.exponent, sizeof(key.exponent));
+  key.is_forgeable = rsa_is_forgeable(static_cast<uint32_t>(key.exponent));
+  const bssl::UniquePtr<BIGNUM> number(BN_bin2bn(record.modulus, record.modulus_length, nullptr));
+  key.bits = static_cast<int>(BN_num_bits(number.get()));
+  return key;
+}
+
+// Whether `tbs` is the tbsCertificate of this certificate.
+bool IsCertificateAt(std::string_view certificate, const uint8_t* tbs) {
+  asn1_hdr header;
+  return asn1_get_next(reinterpret_cast<const uint8_t*>(certificate.data()), certificate.size(),
+                       &header) == 0 &&
+         header.payload == tbs;
+}
+
+std::string_view ToView(const uint8_t* bytes, size_t size) {
+  return {reinterpret_cast<const char*>(bytes), size};
+}
+
+}  // namespace
+
+}  // namespace simulator

@@ -1,0 +1,67 @@
+// The words in which a report is told, whatever they are shown on. Names and details in them come
+// from the files as they are: whoever shows them sees to what may be shown.
+#pragma once
+
+#include <string>
+#include <utility>
+#include <vector>
+
+#include "simulator/verdict/report.h"
+#include "simulator/verdict/wording.h"
+
+namespace simulator {
+
+// What a verdict means to the one who reads it.
+enum class Mood { kGood, kMixed, kBad };
+
+struct VerdictWords {
+  const char* code;  // for programs
+  const char* word;
+  const char* one;  // in the summary, after a number
+  const char* many;
+  Mood mood;
+};
+
+const VerdictWords& WordsOf(Verdict verdict);
+
+// Such as "3 files: 1 signed, 2 refused".
+std::string Summary(const std::vector<Verdict>& verdicts);
+
+// What stands in the line of the verdict behind the file: the package's name, the signer and his
+// key, and the warnings that are alarms. `ellipsis` stands in the midst of a digest.
+std::vector<std::string> HeadFacts(const Report& report, const char* ellipsis);
+
+// What stands before a line.
+enum class Mark { kGood, kBad, kNeither };
+
+Mark MarkOf(ItemState state);
+Mark MarkOf(LinkState state);
+
+// "✓", "✗" and "–", or "+", "x" and "-" where these cannot be shown.
+const char* SymbolOf(Mark mark, bool has_utf8);
+
+std::string NameOf(const Item& item);
+
+// What came of the item, and why; `verdict` is its report's.
+std::string OutcomeOf(const Item& item, Verdict verdict);
+
+// Whether what to do is said below the item. It is said once for neighbours that need the same, and
+// not where it follows from another; `next` is what stands below, null for nothing.
+bool HasCure(const Item& item, const Item* next);
+
+// What stands at the link, and "not reached" beyond a break.
+std::string TextOf(const Link& link);
+
+// Label and value for each fact. The labels are those of apksigner, so that one search finds both.
+using Rows = std::vector<std::pair<std::string, std::string>>;
+// Of a certificate as others read it.
+Rows CertificateRows(const CertificateFacts& certificate);
+// Of the JAR signature: the certificate, and what the kernel got of the key.
+Rows SignerRows(const Report& report);
+
+// The words for a share of the package.
+inline constexpr char kVerifiedWord[] = "verified";
+inline constexpr char kVouchedWord[] = "listed and not verified";
+inline constexpr char kUnlistedWord[] = "not listed";
+
+}  // namespace simulator
