@@ -2,6 +2,7 @@
 
 #include <CLI/CLI.hpp>
 #include <algorithm>
+#include <cmath>
 #include <cstring>
 #include <iostream>
 
@@ -162,10 +163,10 @@ void AddInstallation(CLI::App* app, Options* options) {
 void AddOutput(CLI::App* app, Options* options) {
   const auto print = [app, options](const char* name, Detail detail, const char* description) {
     const auto set = [name, options, detail](int64_t) {
-      if (options->detail != Detail::kUsual) {
+      if (options->show.detail != Detail::kUsual) {
         throw CLI::ValidationError(name, "--quiet and --verbose exclude each other");
       }
-      options->detail = detail;
+      options->show.detail = detail;
     };
     app->add_flag_function(name, set, description)->group(kTheRun);
   };
@@ -173,17 +174,21 @@ void AddOutput(CLI::App* app, Options* options) {
   print("--verbose", Detail::kAll,
         "Print also what the signature leaves out, every\n"
         "signer, and the chain from key to entries");
-  app->add_flag("--json", options->json, "Print the journal, one JSON object a line")
+  app->add_flag("--json", options->show.json, "Print the journal, one JSON object a line")
       ->group(kTheRun);
-  app->add_option("--journal", options->journal, "Keep the journal in FILE")
+  app->add_option("--journal", options->show.journal, "Keep the journal in FILE")
       ->type_name("FILE")
       ->group(kTheRun);
-  app->add_option("--html", options->html, "Write all of it to FILE, a page for a browser")
+  app->add_option("--html", options->show.html, "Write all of it to FILE, a page for a browser")
       ->type_name("FILE")
       ->group(kTheRun);
 }
 
 void AddRun(CLI::App* app, Options* options, std::string* runner) {
+  // "nan" is in every range.
+  const auto is_number = [](const std::string& text) {
+    return std::isnan(strtod(text.c_str(), nullptr)) ? text + " is no number" : std::string();
+  };
   app->add_option("--jobs", options->run.jobs, "Look at so many files at a time [default: 1]")
       ->type_name("N")
       ->check(CLI::Range(1, 1024).description(""))
@@ -193,6 +198,7 @@ void AddRun(CLI::App* app, Options* options, std::string* runner) {
                   "[default: 30]")
       ->type_name("SECONDS")
       ->check(CLI::Range(0.001, 1e6).description(""))
+      ->check(is_number)
       ->group(kTheRun);
   app->add_option("--tool", options->run.tool,
                   "The program to run [default: the apktoolkit\n"

@@ -5,7 +5,7 @@
 
 #include <algorithm>
 
-#include "simulator/package/byte_reader.h"
+#include "simulator/package/cbs.h"
 
 namespace simulator {
 
@@ -22,16 +22,12 @@ std::optional<ArchiveEnd> FindArchiveEnd(int fd) {
                                               : tail.rfind(kMark, tail.size() - kRecordSize, 4);
   if (at == std::string::npos) return {};
   // Mark, two disk numbers, entries on this disk, entries, the directory's size and its offset.
-  ByteReader reader(std::string_view(tail).substr(at));
-  std::string_view passed;
+  CBS record = ToCbs(std::string_view(tail).substr(at));
   ArchiveEnd end = {};
-  uint32_t offset = 0;
-  if (!reader.Bytes(10, &passed) || !reader.U16(&end.entry_count) || !reader.Bytes(4, &passed) ||
-      !reader.U32(&offset)) {
-    return {};
-  }
-  end.directory_offset = offset;
-  return end;
+  const bool is_read = CBS_skip(&record, 10) != 0 &&
+                       CBS_get_u16le(&record, &end.entry_count) != 0 && CBS_skip(&record, 4) != 0 &&
+                       CBS_get_u32le(&record, &end.directory_offset);
+  return is_read ? std::optional(end) : std::nullopt;
 }
 
 std::vector<ArchiveEntry> ReadDirectory(int fd, const ArchiveEnd& end) {
@@ -41,15 +37,14 @@ std::vector<ArchiveEntry> ReadDirectory(int fd, const ArchiveEnd& end) {
   uint64_t offset = end.directory_offset;
   while (entries.size() < end.entry_count) {
     const std::string record = ReadAt(fd, offset, kRecordSize);
-    // Sixteen bytes behind the mark come CRC and sizes; then the lengths of what follows the
-    // record.
-    ByteReader reader(record);
-    std::string_view passed;
-    uint32_t size = 0, length = 0;
+    // Mark, sixteen bytes, the two sizes, the lengths of the three parts behind the record.
+    CBS fields = ToCbs(record);
+    uint32_t size = 0;
     uint16_t name_size = 0, extra_size = 0, comment_size = 0;
-    if (record.compare(0, 4, kMark) != 0 || !reader.Bytes(20, &passed) || !reader.U32(&size) ||
-        !reader.U32(&length) || !reader.U16(&name_size) || !reader.U16(&extra_size) ||
-        !reader.U16(&comment_size)) {
+    if (record.compare(0, 4, kMark) != 0 || !CBS_skip(&fields, 20) ||
+        !CBS_get_u32le(&fields, &size) || !CBS_skip(&fields, 4) ||
+        !CBS_get_u16le(&fields, &name_size) || !CBS_get_u16le(&fields, &extra_size) ||
+        !CBS_get_u16le(&fields, &comment_size)) {
       break;
     }
     std::string name = ReadAt(fd, offset + kRecordSize, name_size);

@@ -13,7 +13,7 @@ namespace simulator {
 struct ArchiveEnd {
   uint16_t entry_count;
   // Of the central directory, as the record has it: maybe beyond the file.
-  uint64_t directory_offset;
+  uint32_t directory_offset;
 };
 
 // What the directory says of one entry.

@@ -3,13 +3,13 @@
 #include <openssl/bn.h>
 
 #include <cstring>
+#include <utility>
 
 #include "apk/apk.h"
 #include "apk/manifest_mf.h"
 #include "crypto/asn1.h"
 #include "crypto/pkcs7.h"
 #include "crypto/rsa.h"
-#include "simulator/package/signature_block.h"
 
 namespace simulator {
 
@@ -67,21 +67,17 @@ void FindBlock(const Archive& archive, JarSignatureFacts* jar) {
 }
 
 void ReadBlock(const Bytes& block, JarSignatureFacts* jar) {
-  const SignatureBlockFacts strict = ParseSignatureBlock(ToView(block.data(), block.size()));
-  jar->block_is_whole = strict.is_whole;
-  jar->signer_count = strict.signer_count;
-  jar->has_signed_attributes = strict.has_signed_attributes;
-  jar->digest = strict.digest;
-  jar->has_known_digest = strict.has_known_digest;
-  jar->has_pss = strict.has_pss;
+  jar->block = ParseSignatureBlock(ToView(block.data(), block.size()));
+  const std::string_view certificate = std::exchange(jar->block.certificate, {});
   pkcs7 record = {};
   const bool is_read = processCert(block.data(), static_cast<uint32_t>(block.size()), &record) == 0;
   if (is_read) jar->key = ReadToolKey(block, record);
-  if (is_read && !IsCertificateAt(strict.certificate, record.tbs_data)) return;
-  jar->certificate = ParseCertificate(strict.certificate);
-  jar->names_other_certificate = jar->certificate && strict.is_whole &&
-                                 strict.signer_id != jar->certificate->issuer_and_serial &&
-                                 strict.signer_id != jar->certificate->key_id;
+  if (is_read && !IsCertificateAt(certificate, record.tbs_data)) return;
+  jar->certificate = ParseCertificate(certificate);
+  const std::string& signer = jar->block.signer_id;
+  jar->names_other_certificate = jar->certificate && jar->block.is_whole &&
+                                 signer != jar->certificate->issuer_and_serial &&
+                                 signer != jar->certificate->key_id;
 }
 
 // None where the key ends beyond the block: the tool does not take it then.

@@ -11,6 +11,7 @@
 
 #include "simulator/package/archive.h"
 #include "simulator/package/certificate.h"
+#include "simulator/package/signature_block.h"
 
 namespace simulator {
 
@@ -37,13 +38,7 @@ struct JarSignatureFacts {
   // None when the tool does not read one.
   std::optional<ToolKey> key;
 
-  // As others read the block.
-  bool block_is_whole = false;
-  size_t signer_count = 0;
-  bool has_signed_attributes = false;
-  std::string digest;  // that the first signer signed
-  bool has_known_digest = false;
-  bool has_pss = false;
+  SignatureBlockFacts block;  // as others read it; its certificate is not kept
   // The first certificate; where the tool reads a key, only if it is the one that the tool reads.
   std::optional<CertificateFacts> certificate;
   bool names_other_certificate = false;  // the first signer is somebody else's, by its identifier

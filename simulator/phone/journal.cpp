@@ -23,15 +23,7 @@ Event& Event::Text(const char* key, std::string_view bytes) {
 }
 
 Event& Event::Hex(const char* key, std::string_view bytes) {
-  constexpr char kDigits[] = "0123456789abcdef";
-  Key(key);
-  line_ += '"';
-  for (const char byte : bytes) {
-    line_ += kDigits[static_cast<uint8_t>(byte) >> 4];
-    line_ += kDigits[static_cast<uint8_t>(byte) & 15];
-  }
-  line_ += '"';
-  return *this;
+  return Json(key, '"' + HexText(bytes) + '"');
 }
 
 Event& Event::Null(const char* key) {

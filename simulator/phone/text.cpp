@@ -9,7 +9,8 @@ namespace simulator {
 namespace {
 
 bool IsPrivateByte(std::string_view character);
-void AppendEscape(unsigned code, std::string* out);
+uint32_t CodeOf(std::string_view character);
+void AppendEscape(uint32_t code, std::string* out);
 
 }  // namespace
 
@@ -18,17 +19,14 @@ std::string EncodeText(std::string_view bytes) {
   while (!bytes.empty()) {
     const size_t length = Utf8Length(bytes);
     const std::string_view character = bytes.substr(0, std::max<size_t>(length, 1));
-    const uint8_t first = static_cast<uint8_t>(character[0]);
     if (length == 0 || IsPrivateByte(character)) {
       for (const char byte : character) AppendEscape(0xf700U | static_cast<uint8_t>(byte), &out);
-    } else if (first < 0x20 || first == 0x7f) {
-      if (first == '\n') {
-        out += "\\n";
-      } else {
-        AppendEscape(first, &out);
-      }
+    } else if (character == "\n") {
+      out += "\\n";
+    } else if (IsHidden(character)) {
+      AppendEscape(CodeOf(character), &out);
     } else {
-      if (first == '"' || first == '\\') out += '\\';
+      if (character == "\"" || character == "\\") out += '\\';
       out += character;
     }
     bytes.remove_prefix(character.size());
@@ -51,6 +49,16 @@ std::string DecodeText(std::string_view utf8) {
     utf8.remove_prefix(character.size());
   }
   return bytes;
+}
+
+std::string HexText(std::string_view bytes) {
+  constexpr char kDigits[] = "0123456789abcdef";
+  std::string text;
+  for (const char byte : bytes) {
+    text += kDigits[static_cast<uint8_t>(byte) >> 4];
+    text += kDigits[static_cast<uint8_t>(byte) & 15];
+  }
+  return text;
 }
 
 // Well-formed as RFC 3629 §4 has it: no overlong forms, no surrogates, nothing above U+10FFFF.
@@ -76,6 +84,18 @@ size_t Utf8Length(std::string_view bytes) {
   return 0;
 }
 
+bool IsHidden(std::string_view character) {
+  constexpr struct {
+    uint32_t first, last;
+  } kHidden[] = {{0, 0x1f},        {0x7f, 0x9f},     {0xad, 0xad},      {0x61c, 0x61c},
+                 {0x180e, 0x180e}, {0x200b, 0x200f}, {0x2028, 0x202e},  {0x2060, 0x206f},
+                 {0xfeff, 0xfeff}, {0xfff9, 0xfffb}, {0xe0000, 0xe007f}};
+  const uint32_t code = CodeOf(character);
+  return std::any_of(std::begin(kHidden), std::end(kHidden), [code](const auto& range) {
+    return code >= range.first && code <= range.last;
+  });
+}
+
 std::vector<std::string> Split(const std::string& text, char separator) {
   std::vector<std::string> parts;
   size_t start = 0;
@@ -94,7 +114,21 @@ bool IsPrivateByte(std::string_view character) {
          (character[1] == '\x9e' || character[1] == '\x9f');
 }
 
-void AppendEscape(unsigned code, std::string* out) {
+uint32_t CodeOf(std::string_view character) {
+  const uint8_t first = static_cast<uint8_t>(character[0]);
+  const size_t size = character.size();
+  uint32_t code = size == 1 ? first : first & (0x7fU >> size);
+  for (const char byte : character.substr(1))
+    code = code << 6 | (static_cast<uint8_t>(byte) & 0x3fU);
+  return code;
+}
+
+// Beyond U+FFFF as two surrogates (RFC 8259 §7).
+void AppendEscape(uint32_t code, std::string* out) {
+  if (code > 0xffff) {
+    AppendEscape(0xd7c0U + (code >> 10), out);
+    code = 0xdc00U + (code & 0x3ffU);
+  }
   char escape[8];
   snprintf(escape, sizeof(escape), "\\u%04x", code);
   *out += escape;

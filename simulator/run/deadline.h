@@ -3,13 +3,16 @@
 
 #include <chrono>
 
+#include "simulator/run/process.h"
+
 namespace simulator {
 
 class Deadline {
  public:
   explicit Deadline(double seconds) : end_(Clock::now() + Seconds(seconds)) {}
 
-  bool HasPassed() const { return Clock::now() >= end_; }
+  // The time is up, or this process is to end.
+  bool HasPassed() const { return Clock::now() >= end_ || IsInterrupted(); }
 
  private:
   using Clock = std::chrono::steady_clock;

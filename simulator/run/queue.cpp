@@ -49,10 +49,11 @@ void RunInOrder(size_t count, unsigned jobs, const std::function<void(size_t num
   for (size_t i = 0; i < std::min<size_t>(jobs, count); ++i) {
     threads.emplace_back(Work, std::cref(run), &shared);
   }
-  for (size_t i = 0; i < count && !IsInterrupted(); ++i) {
+  for (size_t i = 0; i < count; ++i) {
     const auto start = Clock::now();
     std::unique_lock<std::mutex> lock(shared.mutex);
-    while (!shared.has_run[i] && !IsInterrupted()) {
+    const auto is_never_run = [&] { return IsInterrupted() && i >= shared.next; };
+    while (!shared.has_run[i] && !is_never_run()) {
       shared.finished.wait_for(lock, kNowAndThen);
       const auto passed = std::chrono::duration_cast<std::chrono::seconds>(Clock::now() - start);
       if (!shared.has_run[i] && passed.count() > 0) waiting(i, static_cast<int>(passed.count()));

@@ -15,6 +15,7 @@
 #include "simulator/phone/journal.h"
 #include "simulator/phone/text.h"
 #include "simulator/run/tool_process.h"
+#include "util/file.h"
 
 namespace simulator {
 
@@ -22,7 +23,7 @@ namespace {
 
 namespace fs = std::filesystem;
 
-bool Fail(const std::string& message, std::string* error) {
+bool Tell(const std::string& message, std::string* error) {
   *error = message;
   return false;
 }
@@ -71,8 +72,6 @@ struct Simulator::Task {
   Task(const Task&) = delete;
   Task& operator=(const Task&) = delete;
 
-  void Fail(Failure::Kind kind, const std::string& detail) { failure = {kind, detail}; }
-
   const Deadline deadline;
   const int journal;
   std::string path;  // of the file that the tool is given, resolved
@@ -91,11 +90,11 @@ Simulator::~Simulator() {
 
 bool Simulator::Prepare(std::string* error) {
   kernel_descriptor_ = open(kernel_.c_str(), O_RDONLY | O_CLOEXEC);
-  if (kernel_descriptor_ < 0) return Fail("there is no stand-in " + kernel_ + ErrnoText(), error);
+  if (kernel_descriptor_ < 0) return Tell("there is no stand-in " + kernel_ + ErrnoText(), error);
   if (access(options_.tool.c_str(), X_OK) != 0) {
-    return Fail("cannot run " + options_.tool + ErrnoText(), error);
+    return Tell("cannot run " + options_.tool + ErrnoText(), error);
   }
-  return signed_.Load() || Fail("cannot use the directory " + options_.state, error);
+  return signed_.Load() || Tell("cannot use the directory " + options_.state, error);
 }
 
 FileRun Simulator::Run(const std::string& file) {
@@ -104,10 +103,11 @@ FileRun Simulator::Run(const std::string& file) {
   std::string installed = file;
   if (options_.abi) {
     const auto problem = installation.LayOut(file, *options_.abi, task.deadline);
-    if (problem) task.Fail(Failure::Kind::kNotInstalled, *problem);
-    if (problem && task.deadline.HasPassed()) task.Fail(Failure::Kind::kTimedOut, SecondsText());
+    if (problem) Fail(Failure::Kind::kNotInstalled, *problem, &task);
     installed = installation.path();
   }
+  struct stat before = {};
+  const bool is_there = stat(installed.c_str(), &before) == 0 && S_ISREG(before.st_mode);
   task.path = Resolved(installed);
   Event("start").Text("file", file).Text("path", task.path).AppendTo(task.journal);
   if (task.failure.kind == Failure::Kind::kNone) RunToolFor(installed, &task);
@@ -119,25 +119,31 @@ FileRun Simulator::Run(const std::string& file) {
   run.record.failure = task.failure;
   run.record.has_standard_input = has_standard_input_;
   run.record.not_laid_out = installation.left_out();
+  run.record.not_extracted = installation.not_extracted();
+  // What cannot be judged is not looked at.
+  if (task.failure.kind != Failure::Kind::kNone) return run;
   run.facts = LookAt(installed);
+  struct stat after = {};
+  const bool is_same = stat(installed.c_str(), &after) == 0 && IsSameFile(before, after);
+  run.facts.was_changed = run.facts.was_changed || (is_there && !is_same);
   return run;
 }
 
 // Runs the tool, and has the journal tell how it ended.
 void Simulator::RunToolFor(const std::string& file, Task* task) {
   const PhoneSettings phone = PhoneFor(*task);
-  if (task->deadline.HasPassed()) return task->Fail(Failure::Kind::kTimedOut, SecondsText());
+  if (task->deadline.HasPassed()) return Fail(Failure::Kind::kTimedOut, "", task);
   const ToolCommand command = {options_.runner, options_.tool, file, PreloadName(),
                                SettingsToEnvironment(phone)};
   const ToolEnd end = RunTool(command, task->deadline);
   switch (end.how) {
     case ToolEnd::How::kNotStarted:
       errno = end.value;
-      return task->Fail(Failure::Kind::kNotStarted,
-                        "cannot start " + ProgramOf(command) + ErrnoText());
-    case ToolEnd::How::kTimedOut:
+      return Fail(Failure::Kind::kNotStarted, "cannot start " + ProgramOf(command) + ErrnoText(),
+                  task);
+    case ToolEnd::How::kStopped:
       Event("exit").Number("signal", SIGKILL).AppendTo(task->journal);
-      return task->Fail(Failure::Kind::kTimedOut, SecondsText());
+      return Fail(Failure::Kind::kTimedOut, "", task);
     case ToolEnd::How::kKilled:
       Event("exit").Number("signal", end.value).AppendTo(task->journal);
       break;
@@ -148,7 +154,7 @@ void Simulator::RunToolFor(const std::string& file, Task* task) {
   const Events events = ParseEvents(ContentOf(task->journal));
   const auto is_attached = [](const auto& event) { return TextOf(event, "event") == "attached"; };
   if (std::none_of(events.begin(), events.end(), is_attached)) {
-    task->Fail(Failure::Kind::kStandInsMissing, options_.tool);
+    Fail(Failure::Kind::kStandInsMissing, options_.tool, task);
   }
 }
 
@@ -171,19 +177,19 @@ void Simulator::RememberSigned(const Events& events, Task* task) {
   for (const auto& event : events) {
     const bool is_signed = TextOf(event, "event") == "sign" && NumberOf(event, "result") == 0;
     if (!is_signed || signed_.Add(TextOf(event, "path"), task->deadline)) continue;
-    if (task->deadline.HasPassed()) {
-      task->Fail(Failure::Kind::kTimedOut, SecondsText());
-    } else {
-      task->Fail(Failure::Kind::kStateNotKept, options_.state);
-    }
-    return;
+    return Fail(Failure::Kind::kStateNotKept, options_.state, task);
   }
 }
 
-std::string Simulator::SecondsText() const {
-  std::ostringstream text;
-  text << options_.timeout << (options_.timeout == 1 ? " second" : " seconds");
-  return text.str();
+// Once the deadline has passed, everything fails for that.
+void Simulator::Fail(Failure::Kind kind, const std::string& detail, Task* task) const {
+  task->failure = {kind, detail};
+  if (!task->deadline.HasPassed()) return;
+  std::ostringstream seconds;
+  seconds << options_.timeout << (options_.timeout == 1 ? " second" : " seconds");
+  const bool is_late = !IsInterrupted();
+  task->failure = {is_late ? Failure::Kind::kTimedOut : Failure::Kind::kInterrupted,
+                   is_late ? seconds.str() : ""};
 }
 
 }  // namespace simulator

@@ -56,7 +56,7 @@ class Simulator {
   PhoneSettings PhoneFor(const Task& task);
   std::string PreloadName() const;
   void RememberSigned(const Events& events, Task* task);
-  std::string SecondsText() const;
+  void Fail(Failure::Kind kind, const std::string& detail, Task* task) const;
 
   const RunOptions& options_;
   const bool has_standard_input_;

@@ -57,10 +57,17 @@ bool OutputFile::IsSameAs(const OutputFile& other) const {
   return Resolved(path_) == Resolved(other.path_) || fs::equivalent(path_, other.path_, error);
 }
 
+// A pipe is waited for, until somebody reads it, but not for long.
 bool OutputFile::Open() {
+  constexpr int kMostTries = 20;
+  constexpr useconds_t kPause = 100'000;
   if (!IsWanted()) return true;
-  fd_ = open(path_.c_str(), O_WRONLY | O_CREAT | O_TRUNC | O_CLOEXEC, 0666);
-  return fd_ >= 0;
+  for (int i = 0; i < kMostTries && fd_ < 0; ++i) {
+    if (i > 0) usleep(kPause);
+    fd_ = open(path_.c_str(), O_WRONLY | O_CREAT | O_TRUNC | O_CLOEXEC | O_NONBLOCK, 0666);
+    if (fd_ < 0 && errno != ENXIO) return false;
+  }
+  return fd_ >= 0 && fcntl(fd_, F_SETFL, 0) == 0;
 }
 
 bool OutputFile::Append(std::string_view text) const {
@@ -74,7 +81,7 @@ bool OutputFile::Append(std::string_view text) const {
 
 std::string OutputFile::ErrorText() const {
   return std::string("cannot write the ") + kind_.name + " " + path_ + ": " +
-         strerrordesc_np(errno);
+         (errno == ENXIO ? "nobody reads it" : strerrordesc_np(errno));
 }
 
 }  // namespace simulator

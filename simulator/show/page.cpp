@@ -6,9 +6,9 @@
 
 #include "simulator/show/page_template.h"
 #include "simulator/show/protection_bar.h"
-#include "simulator/show/report_words.h"
 #include "simulator/show/terminal.h"
 #include "simulator/show/timeline.h"
+#include "simulator/show/words.h"
 
 namespace simulator {
 
@@ -31,14 +31,12 @@ data Shown(std::string_view bytes);
 std::string Short(std::string_view bytes);
 Reason Short(Reason reason);
 Item Short(Item item);
-CertificateFacts Short(CertificateFacts certificate);
 list OneIf(bool condition);
 void SetMark(Mark mark, data* line);
 void SetLines(const char* name, const list& lines, size_t count, const std::string& remark,
               data* file);
 std::string Grouped(uint64_t number);
 std::string Decimal(double number);
-const char* CodeOf(Mood mood);
 
 }  // namespace
 
@@ -61,17 +59,21 @@ std::string Page::Html() const {
 namespace {
 
 data FileFields(const Report& report, size_t number) {
-  const VerdictWords words = WordsOf(report.verdict);
+  const VerdictWords& words = WordsOf(report.verdict);
   data file;
   file.set("number", Shown(std::to_string(number)));
   file.set("file", Shown(Short(report.file)));
   file.set("verdict", Shown(words.word));
-  file.set("mood", Shown(CodeOf(words.mood)));
+  constexpr const char* kMoods[] = {"good", "mixed", "bad"};
+  file.set("mood", Shown(kMoods[static_cast<size_t>(words.mood)]));
+  Report head;
+  head.package_name = Short(report.package_name);
+  head.signer = report.signer;
+  if (head.signer) head.signer->subject = Short(head.signer->subject);
+  head.key = report.key;
+  for (const Reason& warning : report.warnings) head.warnings.push_back(Short(warning));
   list about;
-  if (!report.package_name.empty()) about.push_back({"fact", Shown(Short(report.package_name))});
-  if (report.signer) {
-    about.push_back({"fact", Shown("signer " + SignerText(Short(*report.signer), "…"))});
-  }
+  for (const std::string& fact : HeadFacts(head, "…")) about.push_back({"fact", Shown(fact)});
   file.set("about", about);
   AddItems(report, &file);
   AddWarnings(report.warnings, &file);
@@ -160,28 +162,34 @@ void AddChain(const std::vector<Link>& chain, data* file) {
 
 // Schemes of the same certificate are told together.
 void AddSigners(const Report& report, data* file) {
-  std::vector<std::pair<std::vector<std::string>, CertificateFacts>> signers;
-  const auto add = [&signers](const std::string& scheme, const CertificateFacts& certificate) {
-    const auto same = std::find_if(signers.begin(), signers.end(), [&](const auto& signer) {
-      return signer.second.sha256 == certificate.sha256;
-    });
-    if (same == signers.end()) return signers.push_back({{scheme}, certificate});
-    auto& schemes = same->first;
-    const bool is_known = std::find(schemes.begin(), schemes.end(), scheme) != schemes.end();
-    if (!is_known) schemes.push_back(scheme);
+  struct Signer {
+    std::vector<std::string> schemes;
+    std::string certificate;  // its digest
+    Rows rows;
   };
-  if (report.signer) add("v1", *report.signer);
-  for (const NewerSignerFacts& signer : report.newer) add(signer.scheme, signer.certificate);
+  std::vector<Signer> signers;
+  if (report.signer || report.key) {
+    signers.push_back({{"v1"}, report.signer ? report.signer->sha256 : "", SignerRows(report)});
+  }
+  for (const auto& [scheme, certificate] : report.newer) {
+    const auto same = std::find_if(
+        signers.begin(), signers.end(),
+        [&digest = certificate.sha256](const Signer& s) { return s.certificate == digest; });
+    if (same == signers.end()) {
+      signers.push_back({{scheme}, certificate.sha256, CertificateRows(certificate)});
+    } else if (same->schemes.back() != scheme) {
+      same->schemes.push_back(scheme);
+    }
+  }
   list lines;
   for (size_t i = 0; i < std::min(signers.size(), kMostPageLines); ++i) {
     list rows;
-    const bool is_jar_signer = i == 0 && report.signer.has_value();
-    for (const auto& [label, value] : CertificateRows(Short(signers[i].second), is_jar_signer)) {
+    for (const auto& [label, value] : signers[i].rows) {
       data row("term", Shown(label));
-      row.set("value", Shown(value));
+      row.set("value", Shown(Short(value)));
       rows.push_back(row);
     }
-    data line("schemes", Shown(Joined(signers[i].first)));
+    data line("schemes", Shown(Joined(signers[i].schemes)));
     line.set("rows", rows);
     lines.push_back(line);
   }
@@ -229,12 +237,6 @@ Item Short(Item item) {
   return item;
 }
 
-CertificateFacts Short(CertificateFacts certificate) {
-  certificate.subject = Short(certificate.subject);
-  certificate.key.algorithm = Short(certificate.key.algorithm);
-  return certificate;
-}
-
 // A section of the template that is shown or not, without fields of its own.
 list OneIf(bool condition) { return condition ? list{data()} : list(); }
 
@@ -267,18 +269,6 @@ std::string Decimal(double number) {
   char text[32];
   snprintf(text, sizeof(text), "%.1f", number);
   return text;
-}
-
-const char* CodeOf(Mood mood) {
-  switch (mood) {
-    case Mood::kGood:
-      return "good";
-    case Mood::kMixed:
-      return "mixed";
-    case Mood::kBad:
-      return "bad";
-  }
-  return "";
 }
 
 }  // namespace

@@ -2,7 +2,7 @@
 
 #include <algorithm>
 
-#include "simulator/show/report_words.h"
+#include "simulator/show/words.h"
 
 namespace simulator {
 

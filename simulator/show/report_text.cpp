@@ -2,8 +2,8 @@
 
 #include <algorithm>
 
-#include "simulator/show/report_words.h"
 #include "simulator/show/timeline.h"
+#include "simulator/show/words.h"
 
 namespace simulator {
 
@@ -11,6 +11,7 @@ namespace {
 
 constexpr size_t kWidth = 80;  // what to do is wrapped to it
 constexpr size_t kMostName = 40;
+constexpr Colour kMoodColours[] = {Colour::kGreen, Colour::kYellow, Colour::kRed};
 
 // Prints one report.
 class Printer {
@@ -30,7 +31,7 @@ class Printer {
  private:
   void PrintItem(const Item& item, size_t width);
   void PrintWrapped(const std::string& text, size_t indent);
-  void PrintCertificate(const CertificateFacts& certificate, bool is_jar_signer);
+  void PrintRows(const Rows& rows);
   std::string Shown(std::string_view bytes) const { return Printable(bytes, look_); }
 
   const Report& report_;
@@ -38,7 +39,6 @@ class Printer {
   std::ostream& out_;
 };
 
-Colour ColourOf(Mood mood);
 std::string ShareText(const Share& share);
 
 }  // namespace
@@ -61,11 +61,11 @@ void PrintReport(const Report& report, Detail detail, const Look& look, std::ost
 namespace {
 
 void Printer::PrintHead() {
-  const VerdictWords words = WordsOf(report_.verdict);
-  out_ << Coloured(words.word, ColourOf(words.mood), look_) << "  " << Shown(report_.file);
-  if (!report_.package_name.empty()) out_ << "   " << Shown(report_.package_name);
-  if (report_.signer) {
-    out_ << "   signer " << Shown(SignerText(*report_.signer, look_.has_utf8 ? "…" : "..."));
+  const VerdictWords& words = WordsOf(report_.verdict);
+  out_ << Coloured(words.word, kMoodColours[static_cast<size_t>(words.mood)], look_) << "  "
+       << Shown(report_.file);
+  for (const std::string& fact : HeadFacts(report_, look_.has_utf8 ? "…" : "...")) {
+    out_ << "   " << Shown(fact);
   }
   out_ << '\n';
 }
@@ -118,15 +118,15 @@ void Printer::PrintWrapped(const std::string& text, size_t indent) {
 }
 
 void Printer::PrintSigner() {
-  if (!report_.signer) return;
+  if (!report_.signer && !report_.key) return;
   out_ << "  signer\n";
-  PrintCertificate(*report_.signer, true);
+  PrintRows(SignerRows(report_));
   out_ << "    schemes: " << Shown(Joined(report_.schemes)) << '\n';
   PrintProtection();
 }
 
-void Printer::PrintCertificate(const CertificateFacts& certificate, bool is_jar_signer) {
-  for (const auto& [label, value] : CertificateRows(certificate, is_jar_signer)) {
+void Printer::PrintRows(const Rows& rows) {
+  for (const auto& [label, value] : rows) {
     out_ << "    " << label << ": " << Shown(value) << '\n';
   }
 }
@@ -134,7 +134,7 @@ void Printer::PrintCertificate(const CertificateFacts& certificate, bool is_jar_
 void Printer::PrintNewerSigners() {
   for (const NewerSignerFacts& signer : report_.newer) {
     out_ << "  signer of " << Shown(signer.scheme) << '\n';
-    PrintCertificate(signer.certificate, false);
+    PrintRows(CertificateRows(signer.certificate));
   }
 }
 
@@ -156,18 +156,6 @@ void Printer::PrintChain() {
     out_ << "    " << SymbolOf(MarkOf(link.state), look_.has_utf8) << " " << link.name << ": "
          << Shown(TextOf(link)) << '\n';
   }
-}
-
-Colour ColourOf(Mood mood) {
-  switch (mood) {
-    case Mood::kGood:
-      return Colour::kGreen;
-    case Mood::kMixed:
-      return Colour::kYellow;
-    case Mood::kBad:
-      return Colour::kRed;
-  }
-  return Colour::kPlain;
 }
 
 std::string ShareText(const Share& share) {

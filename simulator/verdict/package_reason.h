@@ -14,9 +14,4 @@ Reason WhyRefused(const RunRecord& run, const PackageFacts& facts);
 // For a file that the tool did not look at; a null cause when it had no reason not to.
 Reason WhyNotLookedAt(const PackageFacts& facts, bool has_standard_input);
 
-// Whether the tool reads the exponent of this key as 1, or as -1, whose magnitude is the same; and
-// how the exponent is shown.
-bool IsForgeable(const PublicKey& key);
-std::string ExponentText(const PublicKey& key);
-
 }  // namespace simulator

@@ -8,13 +8,12 @@
 
 namespace simulator {
 
-// `items` are the report's: an entry is verified when what was checked against its digest was good.
+// `items` are the report's, the package's own first.
 Protection FindProtection(const PackageFacts& facts, const std::vector<Item>& items);
 
-// Key, certificate, signature file, manifest, entries. It breaks where the package itself was
-// refused, else where a library is not the one that was signed; `verified` are the entries whose
-// digests were good. The first item is the package's own.
-std::vector<Link> MakeChain(const PackageFacts& facts, const std::vector<Item>& items,
-                            const Share& verified);
+// Key, certificate, signature file, manifest, entries. It breaks where the cause says for which the
+// package itself was refused, else where a library is not the one that was signed. Of the report
+// all but the chain is filled.
+std::vector<Link> MakeChain(const PackageFacts& facts, const Report& report);
 
 }  // namespace simulator

@@ -1,16 +1,17 @@
 // What is worth knowing of a file although it changes nothing for the kernel.
 #pragma once
 
-#include <string>
 #include <vector>
 
 #include "simulator/package/facts.h"
+#include "simulator/run/run_record.h"
 #include "simulator/verdict/report.h"
 
 namespace simulator {
 
-// `own` is the file's own item; what its reason says already is not said twice.
-std::vector<Reason> FindWarnings(const PackageFacts& facts, const Item& own,
-                                 const std::vector<std::string>& not_laid_out);
+// Of the report the items, the signers and the key are filled. What the file's own item says
+// already is not said twice.
+std::vector<Reason> FindWarnings(const RunRecord& run, const PackageFacts& facts,
+                                 const Report& report);
 
 }  // namespace simulator
