@@ -72,12 +72,13 @@ bool Archive::Has(const std::string& name) const {
   return !IsMissing(ApkTools::FindZipEntry(handle_, name, &entry));
 }
 
-Archive::ReadResult Archive::Read(const std::string& name, std::vector<uint8_t>* content) const {
+Archive::ReadResult Archive::Read(const std::string& name, std::vector<uint8_t>* content) {
   ZipEntry entry;
   const int32_t found = ApkTools::FindZipEntry(handle_, name, &entry);
   if (IsMissing(found)) return ReadResult::kMissing;
   if (found == 0 && entry.uncompressed_length > kLongestRead &&
       ApkTools::IsPlausibleLength(entry)) {
+    too_long_.push_back(name);
     return ReadResult::kTooLong;
   }
   std::vector<uint8_t> extracted;

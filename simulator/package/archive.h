@@ -64,7 +64,9 @@ class Archive {
   // Whether there is an entry of this name, be it one that cannot be extracted.
   bool Has(const std::string& name) const;
   // The whole entry as the tool extracts it. `content` is changed by kRead alone.
-  ReadResult Read(const std::string& name, std::vector<uint8_t>* content) const;
+  ReadResult Read(const std::string& name, std::vector<uint8_t>* content);
+  // Those that were too long to be read so far.
+  const std::vector<std::string>& too_long() const { return too_long_; }
   // The entry, part by part, until `take` answers false. False when it did not come to its end.
   bool Stream(const std::string& name,
               const std::function<bool(std::string_view part)>& take) const;
@@ -75,6 +77,7 @@ class Archive {
   const ShrinkGuard guard_;
   const int fd_;
   ZipArchiveHandle handle_ = nullptr;
+  std::vector<std::string> too_long_;
 };
 
 }  // namespace simulator

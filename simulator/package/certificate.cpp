@@ -10,6 +10,7 @@
 #include <openssl/x509v3.h>
 
 #include <algorithm>
+#include <cctype>
 
 #include "simulator/phone/text.h"
 
@@ -126,36 +127,15 @@ std::string NameText(const X509_NAME* name) {
 // the JDK's. The value is the library's work: in quotation marks where special characters ask for
 // them, and as hexadecimal digits where it is no text.
 std::string AttributeText(const X509_NAME_ENTRY* attribute) {
-  constexpr struct {
-    int nid;
-    const char* keyword;
-  } kKeywords[] = {{NID_commonName, "CN"},
-                   {NID_countryName, "C"},
-                   {NID_localityName, "L"},
-                   {NID_stateOrProvinceName, "ST"},
-                   {NID_organizationName, "O"},
-                   {NID_organizationalUnitName, "OU"},
-                   {NID_title, "T"},
-                   {NID_streetAddress, "STREET"},
-                   {NID_domainComponent, "DC"},
-                   {NID_dnQualifier, "DNQ"},
-                   {NID_surname, "SURNAME"},
-                   {NID_givenName, "GIVENNAME"},
-                   {NID_initials, "INITIALS"},
-                   {NID_generationQualifier, "GENERATION"},
-                   {NID_userId, "UID"},
-                   {NID_pkcs9_emailAddress, "EMAILADDRESS"},
-                   {NID_serialNumber, "SERIALNUMBER"}};
   constexpr unsigned long kFlags = ASN1_STRFLGS_ESC_2253 | ASN1_STRFLGS_ESC_QUOTE |
                                    ASN1_STRFLGS_UTF8_CONVERT | ASN1_STRFLGS_DUMP_UNKNOWN |
                                    ASN1_STRFLGS_DUMP_DER;
-  const ASN1_OBJECT* const type = X509_NAME_ENTRY_get_object(attribute);
-  char oid[80] = "";
-  OBJ_obj2txt(oid, sizeof(oid), type, 1);
-  std::string text = std::string("OID.") + oid;
-  for (const auto& known : kKeywords) {
-    if (known.nid == OBJ_obj2nid(type)) text = known.keyword;
-  }
+  const AlgorithmFacts type = AlgorithmOf(X509_NAME_ENTRY_get_object(attribute));
+  std::string text = type.nid == NID_undef ? "OID." + type.name : type.name;
+  for (char& c : text) c = static_cast<char>(toupper(static_cast<unsigned char>(c)));
+  if (type.nid == NID_title) text = "T";
+  if (type.nid == NID_surname) text = "SURNAME";
+  if (type.nid == NID_givenName) text = "GIVENNAME";
   const bssl::UniquePtr<BIO> out(BIO_new(BIO_s_mem()));
   ASN1_STRING_print_ex(out.get(), X509_NAME_ENTRY_get_data(attribute), kFlags);
   const uint8_t* value = nullptr;
@@ -166,16 +146,10 @@ std::string AttributeText(const X509_NAME_ENTRY* attribute) {
 
 // The JDK's names of the three kinds that sign packages.
 std::string KeyName(const ASN1_OBJECT* algorithm) {
-  switch (OBJ_obj2nid(algorithm)) {
-    case NID_rsaEncryption:
-      return "RSA";
-    case NID_X9_62_id_ecPublicKey:
-      return "EC";
-    case NID_dsa:
-      return "DSA";
-    default:
-      return AlgorithmOf(algorithm).name;
-  }
+  const AlgorithmFacts facts = AlgorithmOf(algorithm);
+  if (facts.nid == NID_rsaEncryption) return "RSA";
+  if (facts.nid == NID_X9_62_id_ecPublicKey) return "EC";
+  return facts.nid == NID_dsa ? "DSA" : facts.name;
 }
 
 // As keytool's -sigalg takes it: digest "with" key.

@@ -25,9 +25,7 @@ constexpr int kOpenFlags = O_RDONLY | O_CLOEXEC | O_NONBLOCK | O_NOCTTY;
 FileKind KindOf(int fd, uint64_t size);
 bool IsText(const std::string& start);
 void ReadArchive(int fd, PackageFacts* facts);
-std::vector<uint8_t> ReadEntry(const Archive& archive, const std::string& name,
-                               Archive::ReadResult* result, PackageFacts* facts);
-void ListEntries(const Archive& archive, PackageFacts* facts);
+void ListEntries(Archive* archive, PackageFacts* facts);
 bool IsSignatureName(const std::string& name);
 void FindLibraries(const Archive& archive, const std::string& path, PackageFacts* facts);
 LibraryFacts FindLibrary(const std::string& entry, const std::string& path);
@@ -87,33 +85,28 @@ bool IsText(const std::string& start) {
 }
 
 void ReadArchive(int fd, PackageFacts* facts) {
-  const Archive archive(fd, &facts->archive_result);
+  Archive archive(fd, &facts->archive_result);
   if (facts->archive_result != 0) return;
-  Archive::ReadResult result;
-  facts->manifest = ParseAndroidManifest(ReadEntry(archive, kAndroidManifestName, &result, facts));
-  if (facts->manifest.has_overlaps) facts->too_long.push_back(kAndroidManifestName);
-  facts->jar = ReadJarSignature(archive, &facts->too_long);
-  ListEntries(archive, facts);
+  std::vector<uint8_t> manifest;
+  archive.Read(kAndroidManifestName, &manifest);
+  facts->manifest = ParseAndroidManifest(manifest);
+  facts->jar = ReadJarSignature(&archive);
+  ListEntries(&archive, facts);
   FindLibraries(archive, GetFilenameByFd(fd), facts);
+  facts->too_long = archive.too_long();
+  if (facts->manifest.has_overlaps) facts->too_long.push_back(kAndroidManifestName);
   ReadNewerSigners(fd, facts);
   facts->was_changed = archive.HasShrunk();
 }
 
-// Nothing when there is no such entry, or none that reads.
-std::vector<uint8_t> ReadEntry(const Archive& archive, const std::string& name,
-                               Archive::ReadResult* result, PackageFacts* facts) {
-  std::vector<uint8_t> content;
-  *result = archive.Read(name, &content);
-  if (*result == Archive::ReadResult::kTooLong) facts->too_long.push_back(name);
-  return content;
-}
-
-void ListEntries(const Archive& archive, PackageFacts* facts) {
+void ListEntries(Archive* archive, PackageFacts* facts) {
+  std::vector<uint8_t> text;
+  facts->jar.manifest = archive->Read(ApkTools::Apk::kMANIFEST_MF, &text);
   ApkTools::EntryDigests manifest;
-  manifest.Load(ReadEntry(archive, ApkTools::Apk::kMANIFEST_MF, &facts->jar.manifest, facts));
+  manifest.Load(std::move(text));
   manifest.List();
   std::string digest_name, digest;
-  for (ArchiveEntry& entry : archive.Entries()) {
+  for (ArchiveEntry& entry : archive->Entries()) {
     const bool is_listed = manifest.Find(entry.name, digest_name, digest);
     const bool is_signature = IsSignatureName(entry.name);
     facts->entries.push_back({std::move(entry), is_listed, is_signature});

@@ -26,19 +26,15 @@ std::string_view ToView(const uint8_t* bytes, size_t size);
 
 }  // namespace
 
-JarSignatureFacts ReadJarSignature(const Archive& archive, std::vector<std::string>* too_long) {
+JarSignatureFacts ReadJarSignature(Archive* archive) {
   JarSignatureFacts jar;
-  const auto read = [&](const std::string& name, Bytes* content) {
-    const Archive::ReadResult result = archive.Read(name, content);
-    if (result == Archive::ReadResult::kTooLong) too_long->push_back(name);
-    return result == Archive::ReadResult::kRead;
-  };
-  jar.signature_files = archive.Walk(kSignatureFileNames).names;
+  jar.signature_files = archive->Walk(kSignatureFileNames).names;
   if (jar.signature_files.empty()) return jar;
-  Bytes content;
-  if (read(jar.signature_files[0], &content)) ReadSignatureFile(std::move(content), &jar);
-  FindBlock(archive, &jar);
-  if (jar.has_block && read(jar.block_name, &content)) ReadBlock(content, &jar);
+  Bytes text, block;
+  archive->Read(jar.signature_files[0], &text);
+  ReadSignatureFile(std::move(text), &jar);
+  FindBlock(*archive, &jar);
+  if (archive->Read(jar.block_name, &block) == Archive::ReadResult::kRead) ReadBlock(block, &jar);
   return jar;
 }
 

@@ -44,8 +44,6 @@ struct JarSignatureFacts {
   bool names_other_certificate = false;  // the first signer is somebody else's, by its identifier
 };
 
-// Reads the signature in the archive. Entries that are too long to be looked into are added to
-// `too_long`.
-JarSignatureFacts ReadJarSignature(const Archive& archive, std::vector<std::string>* too_long);
+JarSignatureFacts ReadJarSignature(Archive* archive);
 
 }  // namespace simulator

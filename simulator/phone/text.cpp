@@ -63,25 +63,18 @@ std::string HexText(std::string_view bytes) {
 
 // Well-formed as RFC 3629 §4 has it: no overlong forms, no surrogates, nothing above U+10FFFF.
 size_t Utf8Length(std::string_view bytes) {
-  const auto byte = [&bytes](size_t i) {
-    return i < bytes.size() ? static_cast<uint8_t>(bytes[i]) : 0U;
-  };
-  const auto is_tail = [&byte](size_t i) { return (byte(i) & 0xc0U) == 0x80; };
-  const unsigned first = byte(0);
+  constexpr uint32_t kLeast[] = {0, 0, 0x80, 0x800, 0x10000};
   if (bytes.empty()) return 0;
+  const uint8_t first = static_cast<uint8_t>(bytes[0]);
   if (first < 0x80) return 1;
-  if (first >= 0xc2 && first <= 0xdf) return is_tail(1) ? 2 : 0;
-  if (first >= 0xe0 && first <= 0xef) {
-    const bool overlong = first == 0xe0 && byte(1) < 0xa0;
-    const bool surrogate = first == 0xed && byte(1) > 0x9f;
-    return is_tail(1) && is_tail(2) && !overlong && !surrogate ? 3 : 0;
+  const size_t size = first < 0xc0 ? 0 : first < 0xe0 ? 2 : first < 0xf0 ? 3 : first < 0xf8 ? 4 : 0;
+  if (size == 0 || bytes.size() < size) return 0;
+  for (const char byte : bytes.substr(1, size - 1)) {
+    if ((static_cast<uint8_t>(byte) & 0xc0U) != 0x80) return 0;
   }
-  if (first >= 0xf0 && first <= 0xf4) {
-    const bool overlong = first == 0xf0 && byte(1) < 0x90;
-    const bool too_high = first == 0xf4 && byte(1) > 0x8f;
-    return is_tail(1) && is_tail(2) && is_tail(3) && !overlong && !too_high ? 4 : 0;
-  }
-  return 0;
+  const uint32_t code = CodeOf(bytes.substr(0, size));
+  const bool is_character = code >= kLeast[size] && code <= 0x10ffff && code >> 11 != 0x1b;
+  return is_character ? size : 0;
 }
 
 bool IsHidden(std::string_view character) {

@@ -27,7 +27,6 @@ constexpr const char* kPhoneAbis[] = {"arm64-v8a", "armeabi-v7a", "armeabi"};
 // What goes where: the path below the package's directory, and the entry that it comes from.
 using Layout = std::map<std::string, std::string>;
 
-bool KeepsItsLibraries(const Archive& archive);
 std::vector<std::string> LibraryNames(const Archive& archive);
 Layout PlanLayout(const std::vector<std::string>& entries, InstalledAbi choice,
                   std::vector<std::string>* left_out);
@@ -54,8 +53,11 @@ std::optional<std::string> Installation::LayOut(const std::string& file, Install
   const ScopedFd source(open(file.c_str(), O_RDONLY | O_CLOEXEC | O_NONBLOCK));
   int32_t result = -1;
   if (source.get() < 0) return {};
-  const Archive archive(source.get(), &result);
-  if (result != 0 || KeepsItsLibraries(archive)) return {};
+  Archive archive(source.get(), &result);
+  if (result != 0) return {};
+  std::vector<uint8_t> manifest;
+  archive.Read(kAndroidManifestName, &manifest);
+  if (ParseAndroidManifest(manifest).extracts_libraries == false) return {};
   const Layout layout = PlanLayout(LibraryNames(archive), abi, &left_out_);
   if (layout.empty()) return {};
 
@@ -82,12 +84,6 @@ std::optional<std::string> Installation::LayOut(const std::string& file, Install
 }
 
 namespace {
-
-bool KeepsItsLibraries(const Archive& archive) {
-  std::vector<uint8_t> manifest;
-  archive.Read(kAndroidManifestName, &manifest);
-  return ParseAndroidManifest(manifest).extracts_libraries == false;
-}
 
 // Of damaged entries as well.
 std::vector<std::string> LibraryNames(const Archive& archive) {

@@ -10,47 +10,46 @@ namespace simulator {
 
 // What a record of the tool's log says. What is captured of it, if anything, stands behind.
 enum class LogMeaning {
-  kUnknown,  // none of the texts below
-  kDetail,   // of an error that another record names as well
-
-  // The steps of a run.
+  // None of the texts; a detail of an error that another record names as well.
+  kUnknown,
+  kDetail,
+  // The steps of a run: what is taken up is to be signed, the package or one of its libraries.
   kLibrariesBegin,
   kFileBegins,
   kFileEnds,
-  kPackageTakenUp,  // the package or one of its libraries, to be signed
+  kPackageTakenUp,
   kJarTakenUp,
-  kNotSigned,  // what was taken up
-
-  // Why a file is no package, or none that is good.
-  kNoArchive,          // number: the zip library's code
-  kNoAndroidManifest,  // text: the zip library's reason
-  kNoBlock,            // text: its name
+  kNotSigned,
+  // Why a file is no package, or none that is good. Captured are the zip library's code or reason,
+  // the block's name, and the codes of crypto/rsa.h.
+  kNoArchive,
+  kNoAndroidManifest,
+  kNoBlock,
   kBlockMalformed,
-  kKeyRefused,  // number: the code, as crypto/rsa.h has it; so are the next two
+  kKeyRefused,
   kCertificateRefused,
   kSignatureRefused,
-  kOtherDigest,  // a signature is over other data
+  kOtherDigest,
   kManifestRefused,
   kManifestMalformed,
-  kTextMalformed,  // of the manifest or the signature file
+  kTextMalformed,
   kAndroidManifestMalformed,
+  kNoGoodPackage,
   kNoArchiveToSign,
-  kNoGoodPackage,  // said of a JAR, too
-
-  // Why a library or the dex file is none that is good.
+  // Why a library or the dex file is none that is good. Captured are the library's path and errno,
+  // which comes in the record behind.
   kFileNotOpened,
   kFileNotRead,
   kNotListed,
   kDigestUnknown,
   kDexRefused,
-  kLibraryRefused,   // text: its path
-  kLibraryVanished,  // text: its path; the next record has the reason
-  kErrorNumber,      // number: errno
-
+  kLibraryRefused,
+  kLibraryVanished,
+  kErrorNumber,
   // The key.
   kKeyOfRefusedPackage,
   kNoPathOfJar,
-  kRegistrationFailed,
+  kRegistrationFailed
 };
 
 struct LogLine {

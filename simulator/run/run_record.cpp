@@ -92,28 +92,14 @@ void Reader::ReadLog(const json& event) {
 }
 
 void Reader::ReadInformation(const LogLine& line) {
-  switch (line.meaning) {
-    case LogMeaning::kLibrariesBegin:
-      step_ = Step::kLibraries;
-      break;
-    case LogMeaning::kFileBegins:
-      CloseAttempt();
-      step_ = Step::kFile;
-      break;
-    case LogMeaning::kPackageTakenUp:
-      Begin();
-      break;
-    case LogMeaning::kJarTakenUp:
-      record_.is_jar = true;
-      Begin();
-      break;
-    case LogMeaning::kFileEnds:
-      CloseAttempt();
-      step_ = Step::kKey;
-      break;
-    default:
-      break;
+  const LogMeaning meaning = line.meaning;
+  if (meaning == LogMeaning::kLibrariesBegin) step_ = Step::kLibraries;
+  if (meaning == LogMeaning::kFileBegins || meaning == LogMeaning::kFileEnds) {
+    CloseAttempt();
+    step_ = meaning == LogMeaning::kFileBegins ? Step::kFile : Step::kKey;
   }
+  if (meaning == LogMeaning::kJarTakenUp) record_.is_jar = true;
+  if (meaning == LogMeaning::kJarTakenUp || meaning == LogMeaning::kPackageTakenUp) Begin();
 }
 
 // Of an error behind the first step.

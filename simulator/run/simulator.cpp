@@ -49,31 +49,17 @@ std::string OwnDescriptorPath(int fd) {
 }
 
 std::string ContentOf(int fd) {
-  std::string content;
-  char part[1 << 16];
-  ssize_t length;
-  while ((length = pread(fd, part, sizeof(part), static_cast<off_t>(content.size()))) > 0) {
-    content.append(part, static_cast<size_t>(length));
-  }
-  return content;
+  struct stat state = {};
+  fstat(fd, &state);
+  return ReadAt(fd, 0, static_cast<size_t>(state.st_size));
 }
 
 }  // namespace
 
 // Each run has a journal of its own, so that several may run at a time.
 struct Simulator::Task {
-  explicit Task(const Deadline& until)
-      : deadline(until), journal(memfd_create("journal", MFD_CLOEXEC)) {
-    if (journal >= 0) fcntl(journal, F_SETFL, O_APPEND);
-  }
-  ~Task() {
-    if (journal >= 0) close(journal);
-  }
-  Task(const Task&) = delete;
-  Task& operator=(const Task&) = delete;
-
   const Deadline deadline;
-  const int journal;
+  const ScopedFd journal;
   std::string path;  // of the file that the tool is given, resolved
   Failure failure;
 };
@@ -84,13 +70,10 @@ Simulator::Simulator(const RunOptions& options, bool has_standard_input)
       kernel_(ProgramDirectory() + "/../lib/apktoolkit/libapktoolkit_kernel.so"),
       signed_(options.state, options.jobs == 1) {}
 
-Simulator::~Simulator() {
-  if (kernel_descriptor_ >= 0) close(kernel_descriptor_);
-}
-
 bool Simulator::Prepare(std::string* error) {
-  kernel_descriptor_ = open(kernel_.c_str(), O_RDONLY | O_CLOEXEC);
-  if (kernel_descriptor_ < 0) return Tell("there is no stand-in " + kernel_ + ErrnoText(), error);
+  kernel_descriptor_.emplace(open(kernel_.c_str(), O_RDONLY | O_CLOEXEC));
+  if (kernel_descriptor_->get() < 0)
+    return Tell("there is no stand-in " + kernel_ + ErrnoText(), error);
   if (access(options_.tool.c_str(), X_OK) != 0) {
     return Tell("cannot run " + options_.tool + ErrnoText(), error);
   }
@@ -98,7 +81,8 @@ bool Simulator::Prepare(std::string* error) {
 }
 
 FileRun Simulator::Run(const std::string& file) {
-  Task task((Deadline(options_.timeout)));
+  Task task = {Deadline(options_.timeout), ScopedFd(memfd_create("journal", MFD_CLOEXEC)), "", {}};
+  if (task.journal.get() >= 0) fcntl(task.journal.get(), F_SETFL, O_APPEND);
   Installation installation;
   std::string installed = file;
   if (options_.abi) {
@@ -109,11 +93,11 @@ FileRun Simulator::Run(const std::string& file) {
   struct stat before = {};
   const bool is_there = stat(installed.c_str(), &before) == 0 && S_ISREG(before.st_mode);
   task.path = Resolved(installed);
-  Event("start").Text("file", file).Text("path", task.path).AppendTo(task.journal);
+  Event("start").Text("file", file).Text("path", task.path).AppendTo(task.journal.get());
   if (task.failure.kind == Failure::Kind::kNone) RunToolFor(installed, &task);
 
   FileRun run;
-  run.journal = ContentOf(task.journal);
+  run.journal = ContentOf(task.journal.get());
   run.record = TakeApart(ParseEvents(run.journal));
   RememberSigned(run.record.events, &task);
   run.record.failure = task.failure;
@@ -142,16 +126,16 @@ void Simulator::RunToolFor(const std::string& file, Task* task) {
       return Fail(Failure::Kind::kNotStarted, "cannot start " + ProgramOf(command) + ErrnoText(),
                   task);
     case ToolEnd::How::kStopped:
-      Event("exit").Number("signal", SIGKILL).AppendTo(task->journal);
+      Event("exit").Number("signal", SIGKILL).AppendTo(task->journal.get());
       return Fail(Failure::Kind::kTimedOut, "", task);
     case ToolEnd::How::kKilled:
-      Event("exit").Number("signal", end.value).AppendTo(task->journal);
+      Event("exit").Number("signal", end.value).AppendTo(task->journal.get());
       break;
     case ToolEnd::How::kExited:
-      Event("exit").Number("status", end.value).AppendTo(task->journal);
+      Event("exit").Number("status", end.value).AppendTo(task->journal.get());
       break;
   }
-  const Events events = ParseEvents(ContentOf(task->journal));
+  const Events events = ParseEvents(ContentOf(task->journal.get()));
   const auto is_attached = [](const auto& event) { return TextOf(event, "event") == "attached"; };
   if (std::none_of(events.begin(), events.end(), is_attached)) {
     Fail(Failure::Kind::kStandInsMissing, options_.tool, task);
@@ -161,7 +145,7 @@ void Simulator::RunToolFor(const std::string& file, Task* task) {
 // The phone as the run finds it.
 PhoneSettings Simulator::PhoneFor(const Task& task) {
   PhoneSettings phone = options_.phone;
-  phone.journal = OwnDescriptorPath(task.journal);
+  phone.journal = OwnDescriptorPath(task.journal.get());
   for (const std::string& trusted : options_.trust) AddId(trusted, &phone.trusted);
   if (signed_.Holds(task.path, task.deadline)) AddId(task.path, &phone.trusted);
   return phone;
@@ -170,7 +154,7 @@ PhoneSettings Simulator::PhoneFor(const Task& task) {
 // The loader takes spaces and colons for separators; a descriptor's path has none.
 std::string Simulator::PreloadName() const {
   if (kernel_.find_first_of(" :") == std::string::npos) return kernel_;
-  return OwnDescriptorPath(kernel_descriptor_);
+  return OwnDescriptorPath(kernel_descriptor_->get());
 }
 
 void Simulator::RememberSigned(const Events& events, Task* task) {

@@ -11,6 +11,7 @@
 #include "simulator/run/installation.h"
 #include "simulator/run/run_record.h"
 #include "simulator/run/signed_bytes.h"
+#include "util/scoped_fd.h"
 
 namespace simulator {
 
@@ -36,9 +37,6 @@ struct FileRun {
 class Simulator {
  public:
   Simulator(const RunOptions& options, bool has_standard_input);
-  ~Simulator();
-  Simulator(const Simulator&) = delete;
-  Simulator& operator=(const Simulator&) = delete;
 
   // Opens the state and looks for the stand-ins and the tool. False, with `error` set to what to
   // tell the user, when the simulation cannot begin.
@@ -62,7 +60,7 @@ class Simulator {
   const bool has_standard_input_;
   const std::string kernel_;  // the path of the kernel stand-in
   SignedBytes signed_;
-  int kernel_descriptor_ = -1;
+  std::optional<ScopedFd> kernel_descriptor_;
 };
 
 }  // namespace simulator

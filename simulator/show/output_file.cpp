@@ -31,10 +31,6 @@ fs::path Resolved(const std::string& path) {
 
 }  // namespace
 
-OutputFile::~OutputFile() {
-  if (fd_ >= 0) close(fd_);
-}
-
 std::optional<std::string> OutputFile::Objection(const std::vector<std::string>& inputs) const {
   const std::string named = std::string(kind_.option) + " " + path_;
   struct stat state = {};
@@ -62,17 +58,18 @@ bool OutputFile::Open() {
   constexpr int kMostTries = 20;
   constexpr useconds_t kPause = 100'000;
   if (!IsWanted()) return true;
-  for (int i = 0; i < kMostTries && fd_ < 0; ++i) {
+  const int flags = O_WRONLY | O_CREAT | O_TRUNC | O_CLOEXEC | O_NONBLOCK;
+  for (int i = 0; i < kMostTries; ++i) {
     if (i > 0) usleep(kPause);
-    fd_ = open(path_.c_str(), O_WRONLY | O_CREAT | O_TRUNC | O_CLOEXEC | O_NONBLOCK, 0666);
-    if (fd_ < 0 && errno != ENXIO) return false;
+    file_.emplace(open(path_.c_str(), flags, 0666));
+    if (file_->get() >= 0 || errno != ENXIO) break;
   }
-  return fd_ >= 0 && fcntl(fd_, F_SETFL, 0) == 0;
+  return file_->get() >= 0 && fcntl(file_->get(), F_SETFL, 0) == 0;
 }
 
 bool OutputFile::Append(std::string_view text) const {
   while (IsWanted() && !text.empty()) {
-    const ssize_t part = write(fd_, text.data(), text.size());
+    const ssize_t part = write(file_->get(), text.data(), text.size());
     if (part <= 0) return false;
     text.remove_prefix(static_cast<size_t>(part));
   }

@@ -22,6 +22,9 @@ inline constexpr std::string_view kPageStart =
 inline constexpr size_t kMostPageLines = 200;
 inline constexpr size_t kMostPageText = 400;
 
+// The page's template (page.mustache), which the build makes a part of the program.
+extern const char kPageTemplate[];
+
 class Page {
  public:
   // The next file, in the order of the command line.

@@ -1,8 +1,9 @@
-#include "simulator/verdict/library_items.h"
-
+// A package's native libraries.
 #include <algorithm>
 #include <cerrno>
 #include <cstdio>
+
+#include "simulator/verdict/parts.h"
 
 namespace simulator {
 
@@ -104,35 +105,22 @@ Reason WhyNotSigned(const Library& library, const RunRecord& run, const PackageF
 }
 
 Reason WhyNotVerified(const Library& library, const PackageFacts& facts) {
-  switch (library.attempt->why) {
-    case LogMeaning::kFileNotOpened:
-      return WhyNotThere(library.facts, facts);
-    case LogMeaning::kFileNotRead:
-      return {&cause::kLibraryNoFile, ""};
-    case LogMeaning::kNotListed:
-      return {&cause::kLibraryNotListed, ""};
-    case LogMeaning::kDigestUnknown:
-      return {&cause::kLibraryDigest, ""};
-    default:
-      return {&cause::kLibraryChanged, ""};
-  }
+  const LogMeaning why = library.attempt->why;
+  if (why == LogMeaning::kFileNotOpened) return WhyNotThere(library.facts, facts);
+  if (why == LogMeaning::kFileNotRead) return {&cause::kLibraryNoFile, ""};
+  if (why == LogMeaning::kNotListed) return {&cause::kLibraryNotListed, ""};
+  if (why == LogMeaning::kDigestUnknown) return {&cause::kLibraryDigest, ""};
+  return {&cause::kLibraryChanged, ""};
 }
 
 // The tool does not log why a file does not open; the file system still knew.
 Reason WhyNotThere(const LibraryFacts& library, const PackageFacts& facts) {
-  switch (library.error) {
-    case ENOENT:
-    case ENOTDIR:
-      break;
-    case EACCES:
-    case EPERM:
-      return {&cause::kLibraryNoPermission, ""};
-    case EWOULDBLOCK:
-      return {&cause::kLibraryLeased, ""};
-    case 0:
-      return {&cause::kLibraryNotOpened, "why is not known"};
-    default:
-      return {&cause::kLibraryNotOpened, DescribeErrno(library.error)};
+  const int error = library.error;
+  if (error == EACCES || error == EPERM) return {&cause::kLibraryNoPermission, ""};
+  if (error == EWOULDBLOCK) return {&cause::kLibraryLeased, ""};
+  if (error == 0) return {&cause::kLibraryNotOpened, "why is not known"};
+  if (error != ENOENT && error != ENOTDIR) {
+    return {&cause::kLibraryNotOpened, DescribeErrno(error)};
   }
   if (facts.manifest.extracts_libraries == false) return {&cause::kLibraryInPackage, ""};
   return {library.has_directory ? &cause::kLibraryMissing : &cause::kLibraryNotInstalled, ""};

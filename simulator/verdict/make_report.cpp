@@ -6,10 +6,7 @@
 
 #include "apk/zip_library.h"
 #include "sign/libzu.h"
-#include "simulator/verdict/library_items.h"
-#include "simulator/verdict/package_reason.h"
-#include "simulator/verdict/protection.h"
-#include "simulator/verdict/warnings.h"
+#include "simulator/verdict/parts.h"
 
 namespace simulator {
 
@@ -80,20 +77,9 @@ std::string Reason::Text() const {
 }
 
 ExitStatus StatusOf(Verdict verdict) {
-  switch (verdict) {
-    case Verdict::kSigned:
-    case Verdict::kTrustedJar:
-      return kAllSigned;
-    case Verdict::kPartlySigned:
-    case Verdict::kRefused:
-    case Verdict::kNotTrustedJar:
-      return kSomeRefused;
-    case Verdict::kNotLookedAt:
-      return kNotLookedAt;
-    case Verdict::kNotSimulated:
-      break;
-  }
-  return kCannotSimulate;
+  constexpr ExitStatus kStatuses[] = {kAllSigned,   kAllSigned,   kSomeRefused,   kSomeRefused,
+                                      kSomeRefused, kNotLookedAt, kCannotSimulate};
+  return kStatuses[static_cast<size_t>(verdict)];
 }
 
 namespace {
@@ -101,9 +87,8 @@ namespace {
 // The file itself.
 Item OwnItem(const RunRecord& run, const PackageFacts& facts, const JudgeOptions& options) {
   const ItemKind kind = KindOf(run);
-  const char* const name = kind == ItemKind::kPackage ? "package"
-                           : kind == ItemKind::kJar   ? "JAR"
-                                                      : "file";
+  constexpr const char* kNames[] = {"package", "JAR", "file"};
+  const char* const name = kNames[static_cast<size_t>(kind)];
   Reason reason;
   if (run.verify_error.value_or(0) != 0) {
     reason = WhyJarRefused(run);
@@ -137,24 +122,16 @@ Reason WhyJarRefused(const RunRecord& run) {
   return {&cause::kJarNotTrusted, DescribeErrno(run.verify_error.value_or(0))};
 }
 
+// A null cause when nothing failed.
 Reason WhyFailed(const Failure& failure) {
-  switch (failure.kind) {
-    case Failure::Kind::kNone:
-      break;
-    case Failure::Kind::kNotStarted:
-      return {&cause::kToolNotStarted, failure.detail};
-    case Failure::Kind::kTimedOut:
-      return {&cause::kToolTimedOut, failure.detail};
-    case Failure::Kind::kInterrupted:
-      return {&cause::kInterrupted, ""};
-    case Failure::Kind::kStandInsMissing:
-      return {&cause::kStandInsMissing, failure.detail};
-    case Failure::Kind::kStateNotKept:
-      return {&cause::kStateNotKept, failure.detail};
-    case Failure::Kind::kNotInstalled:
-      return {&cause::kNotInstalled, failure.detail};
-  }
-  return {};
+  constexpr const Cause* kCauses[] = {nullptr,
+                                      &cause::kToolNotStarted,
+                                      &cause::kToolTimedOut,
+                                      &cause::kInterrupted,
+                                      &cause::kStandInsMissing,
+                                      &cause::kStateNotKept,
+                                      &cause::kNotInstalled};
+  return {kCauses[static_cast<size_t>(failure.kind)], failure.detail};
 }
 
 void AddKeyItems(const RunRecord& run, const JudgeOptions& options, std::vector<Item>* items) {

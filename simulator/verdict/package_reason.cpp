@@ -1,9 +1,9 @@
-#include "simulator/verdict/package_reason.h"
-
+// Why a package is refused, or not looked at.
 #include <algorithm>
 #include <cerrno>
 
 #include "crypto/rsa.h"
+#include "simulator/verdict/parts.h"
 #include "simulator/verdict/wording.h"
 #include "util/text.h"
 
@@ -63,19 +63,11 @@ Reason WhyRefused(const RunRecord& run, const PackageFacts& facts) {
 }
 
 Reason WhyNotLookedAt(const PackageFacts& facts, bool has_standard_input) {
-  switch (facts.error) {
-    case 0:
-      break;
-    case ENOENT:
-      return {&cause::kFileMissing, ""};
-    case EACCES:
-    case EPERM:
-      return {&cause::kFileNoPermission, ""};
-    case EWOULDBLOCK:
-      return {&cause::kFileLeased, ""};
-    default:
-      return {&cause::kFileNotOpened, DescribeErrno(facts.error)};
-  }
+  const int error = facts.error;
+  if (error == ENOENT) return {&cause::kFileMissing, ""};
+  if (error == EACCES || error == EPERM) return {&cause::kFileNoPermission, ""};
+  if (error == EWOULDBLOCK) return {&cause::kFileLeased, ""};
+  if (error != 0) return {&cause::kFileNotOpened, DescribeErrno(error)};
   if (!has_standard_input) return {&cause::kStandardInputClosed, ""};
   if (facts.is_read_only) return {&cause::kReadOnlyFileSystem, ""};
   return {};
@@ -91,23 +83,11 @@ Reason WhyDexRefused(LogMeaning why) {
 
 Reason WhyNotOpened(const PackageFacts& facts, int64_t code) {
   constexpr int64_t kNoEntries = -6;  // which the zip library's header does not name
-  switch (facts.kind) {
-    case FileKind::kDirectory:
-      return {&cause::kFolder, ""};
-    case FileKind::kSpecial:
-      return {&cause::kSpecialFile, ""};
-    case FileKind::kEmpty:
-      return {&cause::kEmptyFile, ""};
-    case FileKind::kText:
-      return {&cause::kTextFile, ""};
-    case FileKind::kCutArchive:
-      return {&cause::kCutArchive, ""};
-    case FileKind::kNoArchive:
-      return {&cause::kNoArchive, ""};
-    case FileKind::kArchive:
-    case FileKind::kUnreadable:
-      break;
-  }
+  constexpr const Cause* kCauses[] = {
+      nullptr,           &cause::kFolder,     &cause::kSpecialFile, &cause::kEmptyFile,
+      &cause::kTextFile, &cause::kCutArchive, &cause::kNoArchive,   nullptr};
+  const Cause* const why = kCauses[static_cast<size_t>(facts.kind)];
+  if (why != nullptr) return {why, ""};
   return {code == kNoEntries ? &cause::kEmptyArchive : &cause::kDamagedArchive, ""};
 }
 

@@ -1,9 +1,9 @@
-#include "simulator/verdict/protection.h"
-
+// What a package's signature protects.
 #include <algorithm>
 #include <set>
 #include <string>
 
+#include "simulator/verdict/parts.h"
 #include "simulator/verdict/wording.h"
 
 namespace simulator {

@@ -26,12 +26,9 @@ enum class Verdict {
 
 enum class ItemKind { kPackage, kJar, kFile, kEntries, kLibrary, kKey, kTool };
 
-enum class ItemState {
-  kDone,     // signed, or registered
-  kRefused,  // should have been, and was not
-  kAbsent,   // a library that does not lie beside the package; refused where the user is strict
-  kNothing,  // nothing to sign
-};
+// Signed or registered; should have been and was not; a library that does not lie beside the
+// package, which is refused where the user is strict; nothing to sign.
+enum class ItemState { kDone, kRefused, kAbsent, kNothing };
 
 // A cause with what fills in its "%s".
 struct Reason {

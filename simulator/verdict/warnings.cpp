@@ -1,7 +1,7 @@
-#include "simulator/verdict/warnings.h"
-
+// What is worth a second look.
 #include <algorithm>
 
+#include "simulator/verdict/parts.h"
 #include "simulator/verdict/wording.h"
 
 namespace simulator {

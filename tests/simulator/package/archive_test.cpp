@@ -87,7 +87,7 @@ TEST(Archive, ReadsWhatTheToolExtracts) {
   const MemoryFile file(
       BuildZip({deflated, Damaged("damaged"), ClaimingLength(Good("lying"), 0xfffffff0)}));
   int32_t result = -1;
-  const Archive archive(file.fd(), &result);
+  Archive archive(file.fd(), &result);
   std::vector<uint8_t> content = ToBytes("before");
   EXPECT_EQ(archive.Read("none", &content), Archive::ReadResult::kMissing);
   EXPECT_EQ(archive.Read(std::string(65536, 'n'), &content), Archive::ReadResult::kMissing);
@@ -106,9 +106,10 @@ TEST(Archive, LongEntriesAreNotRead) {
   ZipItem longer = {"longer", Bytes(Archive::kLongestRead + 1, 'a'), true};
   const MemoryFile file(BuildZip({longest, longer}));
   int32_t result = -1;
-  const Archive archive(file.fd(), &result);
+  Archive archive(file.fd(), &result);
   std::vector<uint8_t> content;
   EXPECT_EQ(archive.Read("longer", &content), Archive::ReadResult::kTooLong);
+  EXPECT_EQ(archive.too_long(), Lines({"longer"}));
   EXPECT_TRUE(content.empty());
   EXPECT_EQ(archive.Read("longest", &content), Archive::ReadResult::kRead);
   EXPECT_EQ(content.size(), Archive::kLongestRead);

@@ -6,7 +6,6 @@
 
 #include "simulator/phone/text.h"
 #include "simulator/show/hostile_report.h"
-#include "simulator/show/page_template.h"
 
 using namespace simulator;
 

@@ -1,4 +1,4 @@
-#include "simulator/verdict/protection.h"
+#include "simulator/verdict/parts.h"
 
 #include <gtest/gtest.h>
 

@@ -1,4 +1,4 @@
-#include "simulator/verdict/warnings.h"
+#include "simulator/verdict/parts.h"
 
 #include <gtest/gtest.h>
 
