@@ -126,17 +126,8 @@ bool IsNameForInstallers(const std::string& entry) {
 }
 
 bool Wants(InstalledAbi choice, bool is_arm64, bool has_arm64) {
-  switch (choice) {
-    case InstalledAbi::kAll:
-      return true;
-    case InstalledAbi::kArm64:
-      return is_arm64;
-    case InstalledAbi::kArm:
-      return !is_arm64;
-    case InstalledAbi::kPreferred:
-      return is_arm64 || !has_arm64;
-  }
-  return false;
+  if (choice == InstalledAbi::kPreferred) return is_arm64 || !has_arm64;
+  return choice == InstalledAbi::kAll || (choice == InstalledAbi::kArm64) == is_arm64;
 }
 
 // The package itself under another name where the file system allows it, else a copy. False with

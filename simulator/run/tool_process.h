@@ -4,7 +4,7 @@
 #include <string>
 #include <vector>
 
-#include "simulator/run/deadline.h"
+#include "simulator/run/process.h"
 
 namespace simulator {
 

@@ -32,28 +32,18 @@ Reason WhyRefused(const RunRecord& run, const PackageFacts& facts) {
   const JarSignatureFacts& jar = facts.jar;
   if (run.is_dex_refused) return WhyDexRefused(run.dex_why);
   for (const LogLine& line : errors) {
-    switch (line.meaning) {
-      case LogMeaning::kNoArchive:
-        return WhyNotOpened(facts, line.number);
-      case LogMeaning::kNoBlock:
-        return WhyNoBlock(line.text, jar);
-      case LogMeaning::kBlockMalformed:
-        return OfOtherKey(jar);
-      case LogMeaning::kKeyRefused:
-        return WhyNoKey(line.number, jar);
-      case LogMeaning::kCertificateRefused:
-        return WhyCertificateRefused(line.number, jar);
-      case LogMeaning::kSignatureRefused:
-        return WhySignatureRefused(errors, line.number, jar);
-      case LogMeaning::kManifestRefused:
-        return WhyManifestRefused(errors, jar);
-      case LogMeaning::kManifestMalformed:
-        return {&cause::kManifestMalformed, ""};
-      case LogMeaning::kAndroidManifestMalformed:
-        return {&cause::kAndroidManifestText, ""};
-      default:
-        break;
+    const LogMeaning meaning = line.meaning;
+    if (meaning == LogMeaning::kNoArchive) return WhyNotOpened(facts, line.number);
+    if (meaning == LogMeaning::kNoBlock) return WhyNoBlock(line.text, jar);
+    if (meaning == LogMeaning::kBlockMalformed) return OfOtherKey(jar);
+    if (meaning == LogMeaning::kKeyRefused) return WhyNoKey(line.number, jar);
+    if (meaning == LogMeaning::kCertificateRefused) return WhyCertificateRefused(line.number, jar);
+    if (meaning == LogMeaning::kSignatureRefused) {
+      return WhySignatureRefused(errors, line.number, jar);
     }
+    if (meaning == LogMeaning::kManifestRefused) return WhyManifestRefused(errors, jar);
+    if (meaning == LogMeaning::kManifestMalformed) return {&cause::kManifestMalformed, ""};
+    if (meaning == LogMeaning::kAndroidManifestMalformed) return {&cause::kAndroidManifestText, ""};
   }
   if (FindError(errors, LogMeaning::kTextMalformed) != nullptr) {
     return {&cause::kSignatureFileMalformed, FirstSignatureFile(jar)};
