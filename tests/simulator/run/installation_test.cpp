@@ -239,3 +239,17 @@ TEST(Installation, SaysWhenThereIsNoPlaceForIt) {
   setenv("TMPDIR", kept.c_str(), 1);
   EXPECT_TRUE(problem.has_value());
 }
+
+// What is written when an interruption comes is not waited for: however much time is left.
+TEST(Installation, EndsWhenTheProcessIsToEnd) {
+  const TempDir folder;
+  const std::string file = folder / "base.apk";
+  MakePackage(WithLibraries({kBoth[0]})).WriteTo(file);
+  const auto lay_out = [&] {
+    CatchInterruptions();
+    raise(SIGTERM);
+    const auto objection = Installation().LayOut(file, InstalledAbi::kAll, kLater);
+    _exit(objection == std::nullopt ? 1 : 0);
+  };
+  EXPECT_EXIT(lay_out(), testing::ExitedWithCode(0), "");
+}
