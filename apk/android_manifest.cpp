@@ -1,8 +1,11 @@
 // What the compiled Android manifest says: the package's name, and whether it asks for secure
-// storage.
+// storage. Its texts are the document's, and a hostile one has long texts looked at again and
+// again: they are compared as they are, length first, and none but the package's name is converted.
 #include <androidfw/ResourceTypes.h>
 #include <utils/String8.h>
 
+#include <cstring>
+#include <set>
 #include <string_view>
 
 #include "apk/apk.h"
@@ -14,19 +17,28 @@ namespace {
 
 using android::ResXMLParser;
 using android::String8;
+using Text = std::u16string_view;
 
-void ReadStartTag(const ResXMLParser& parser, String8& package_name, bool& ss_permission_required);
-String8 getStrAttr(const ResXMLParser& parser, const char* name);
-String8 ToUtf8(const char16_t* text, size_t length);
-bool Equals(const String8& string, std::string_view text);
+// A text as the parser answers, null for one that it does not have.
+Text View(const char16_t* text, size_t size) { return text == nullptr ? Text() : Text(text, size); }
+
+String8 ReadPackageName(const ResXMLParser& parser, std::set<const char16_t*>* nameless);
+bool AsksForSecureStorage(const ResXMLParser& parser, Text element);
+Text getStrAttr(const ResXMLParser& parser, std::string_view name);
+bool Equals(Text text, std::string_view wanted);
+bool IsUnpairedSurrogate(Text text);
+uint16_t FirstUnit(Text text);
 
 }  // namespace
 
-bool Apk::ParseAndroidManifest(const std::vector<uint8_t>& bytes) {
-  // The parser reads the document's header without asking whether there is room for one.
-  const bool has_header = bytes.size() >= sizeof(android::ResXMLTree_header);
+bool Apk::ParseAndroidManifest(std::vector<uint8_t> bytes) {
+  // The parser reads a header, or an attribute, without asking whether all of it is there, so there
+  // is room for one behind the document. Bytes with no room for a header are no document.
+  const size_t size = bytes.size(), room = size + sizeof(android::ResXMLTree_attribute);
+  bytes.reserve(room);
+  bytes.resize(room);
   android::ResXMLTree parser;
-  parser.setTo(bytes.data(), has_header ? bytes.size() : 0, false);
+  parser.setTo(bytes.data(), size < sizeof(android::ResChunk_header) ? 0 : size, false);
   if (const android::status_t error = parser.getError(); error != 0) {
     LogError("%s failed to init xml parser, error=0x%08x\n", "ParseAndroidManifest",
              static_cast<unsigned>(error));
@@ -34,20 +46,20 @@ bool Apk::ParseAndroidManifest(const std::vector<uint8_t>& bytes) {
   }
 
   String8 package_name;
-  // Deliberate: read and consulted by nobody, so that no test can tell. Local names alone are
-  // compared, in any namespace.
-  String8 namespace_uri;
+  std::set<const char16_t*> nameless;
   for (ResXMLParser::event_code_t event = parser.next(); event != ResXMLParser::END_DOCUMENT;
        event = parser.next()) {
     // Deliberate: a document that turns bad is one that ends early. What was found before stands.
     if (event == ResXMLParser::BAD_DOCUMENT) break;
-    if (event == ResXMLParser::START_NAMESPACE) {
-      size_t length = 0;
-      const char16_t* uri = parser.getNamespaceUri(&length);
-      namespace_uri = ToUtf8(uri, length);
-    }
-    if (event == ResXMLParser::START_TAG) {
-      ReadStartTag(parser, package_name, ss_permission_required_);
+    // Elements count at any depth.
+    if (event != ResXMLParser::START_TAG) continue;
+    size_t length = 0;
+    const char16_t* const element_name = parser.getElementName(&length);
+    const Text element = View(element_name, length);
+    if (Equals(element, "manifest")) {
+      if (package_name.length() == 0) package_name = ReadPackageName(parser, &nameless);
+    } else if (!ss_permission_required_) {
+      ss_permission_required_ = AsksForSecureStorage(parser, element);
     }
   }
   package_name_.assign(package_name.c_str(), package_name.length());
@@ -56,58 +68,77 @@ bool Apk::ParseAndroidManifest(const std::vector<uint8_t>& bytes) {
 
 namespace {
 
-// Elements count at any depth.
-void ReadStartTag(const ResXMLParser& parser, String8& package_name, bool& ss_permission_required) {
-  size_t length = 0;
-  const char16_t* text = parser.getElementName(&length);
-  const String8 element = ToUtf8(text, length);
+// A text of nothing but unpaired surrogates converts to none. It is converted once, and then it is
+// among the `nameless`.
+String8 ReadPackageName(const ResXMLParser& parser, std::set<const char16_t*>* nameless) {
+  const Text name = getStrAttr(parser, "package");
+  if (name.empty() || !nameless->insert(name.data()).second) return String8();
+  return String8(name.data(), name.size());
+}
 
-  if (Equals(element, "manifest")) {
-    if (package_name.length() == 0) package_name = getStrAttr(parser, "package");
-    return;
+// Deliberate: a package that declares the permission counts like one that asks for it.
+bool AsksForSecureStorage(const ResXMLParser& parser, Text element) {
+  if (Equals(element, "meta-data")) {
+    return Equals(getStrAttr(parser, "name"), "access") &&
+           Equals(getStrAttr(parser, "value"), "SS_META");
   }
-  if (ss_permission_required) return;
-  // Deliberate: whoever declares the permission counts like one who asks for it.
-  if (Equals(element, "uses-permission") || Equals(element, "permission")) {
-    const String8 name = getStrAttr(parser, "name");
-    ss_permission_required =
-        Equals(name, "com.qix.android.SECURE_STORAGE") ||
-        Equals(name, "com.qix.android.securestorage.permission.SECURE_STORAGE");
-  } else if (Equals(element, "meta-data")) {
-    ss_permission_required = Equals(getStrAttr(parser, "name"), "access") &&
-                             Equals(getStrAttr(parser, "value"), "SS_META");
-  }
+  if (!Equals(element, "uses-permission") && !Equals(element, "permission")) return false;
+  const Text name = getStrAttr(parser, "name");
+  return Equals(name, "com.qix.android.SECURE_STORAGE") ||
+         Equals(name, "com.qix.android.securestorage.permission.SECURE_STORAGE");
 }
 
 // The text of the first attribute of this name that has one; references and numbers have none.
-// Empty when there is no such attribute.
-String8 getStrAttr(const ResXMLParser& parser, const char* name) {
+// Empty if there is no such attribute.
+Text getStrAttr(const ResXMLParser& parser, std::string_view name) {
+  ResXMLParser::ResXMLPosition position;
+  parser.getPosition(&position);
+  android::ResXMLTree_attrExt tag;
+  memcpy(&tag, position.curExt, sizeof(tag));
   for (size_t i = 0; i < parser.getAttributeCount(); ++i) {
-    // Deliberate: attributes are known by their local names, in any namespace or none.
+    // Attributes of size 0 lie in one place. Up to 65,535 of them are one attribute.
+    if (i > 0 && tag.attributeSize == 0) break;
     size_t length = 0;
     const char16_t* text = parser.getAttributeName(i, &length);
-    if (!Equals(ToUtf8(text, length), name)) continue;
+    // Deliberate: attributes are known by their local names, in any namespace or none.
+    if (!Equals(View(text, length), name)) continue;
 
     android::Res_value value = {};
     if (parser.getAttributeValue(i, &value) == 0) continue;
     if (value.dataType != android::Res_value::TYPE_STRING) continue;
-
     length = 0;
     text = parser.getAttributeStringValue(i, &length);
-    if (text != nullptr) return String8(text, length);
+    if (text != nullptr) return Text(text, length);
   }
-  return String8();
+  return {};
 }
 
-// The parser answers null, and leaves the length alone, for a text that it does not have; that is
-// an empty one.
-String8 ToUtf8(const char16_t* text, size_t length) {
-  return text == nullptr ? String8() : String8(text, length);
+// True if `text` is `wanted` when the platform converts it to UTF-8. That conversion drops unpaired
+// surrogates. Deliberate: so does this, up to a number that keeps every comparison short.
+bool Equals(Text text, std::string_view wanted) {
+  constexpr size_t kMostSurrogates = 16;
+  if (text.size() < wanted.size() || text.size() > wanted.size() + kMostSurrogates) return false;
+  size_t found = 0;
+  for (; !text.empty(); text.remove_prefix(1)) {
+    if (IsUnpairedSurrogate(text)) continue;
+    if (found == wanted.size() || FirstUnit(text) != wanted[found++]) return false;
+  }
+  return found == wanted.size();
 }
 
-// Over the whole length, embedded NULs included.
-bool Equals(const String8& string, std::string_view text) {
-  return std::string_view(string.c_str(), string.length()) == text;
+// Tells of the first unit of a text that does not begin in the middle of a pair.
+bool IsUnpairedSurrogate(Text text) {
+  constexpr int kHigh = 0xD800 >> 10, kLow = 0xDC00 >> 10;
+  const int kind = FirstUnit(text) >> 10;
+  const bool is_pair = text.size() > 1 && FirstUnit(text.substr(1)) >> 10 == kLow;
+  return kind == kLow || (kind == kHigh && !is_pair);
+}
+
+// A hostile document has texts and elements at odd addresses.
+uint16_t FirstUnit(Text text) {
+  uint16_t unit;
+  memcpy(&unit, static_cast<const void*>(text.data()), sizeof(unit));
+  return unit;
 }
 
 }  // namespace

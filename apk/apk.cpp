@@ -28,11 +28,11 @@ void Apk::Init(int fd, const char* path) {
     return;
   }
   is_apk_ = true;
-  is_good_apk_ = VerifyPackage(android_manifest);
+  is_good_apk_ = VerifyPackage(std::move(android_manifest));
 }
 
 // The signature first, then what it vouches for.
-bool Apk::VerifyPackage(const std::vector<uint8_t>& android_manifest) {
+bool Apk::VerifyPackage(std::vector<uint8_t> android_manifest) {
   std::vector<uint8_t> manifest;
   if (ExtractEntry(kMANIFEST_MF, manifest) != 0) return false;
 
@@ -47,7 +47,7 @@ bool Apk::VerifyPackage(const std::vector<uint8_t>& android_manifest) {
     LogError("Can't load manifest: size=%zu\n", size);
     return false;
   }
-  if (!ParseAndroidManifest(android_manifest)) {
+  if (!ParseAndroidManifest(std::move(android_manifest))) {
     LogError("Can't process Android Manifest.\n");
     return false;
   }

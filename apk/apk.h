@@ -1,12 +1,11 @@
 // The opened file: its zip archive, what its manifests say, and how far it verified.
 //
-// An Apk owns its facts, but not the descriptor that it is given. It never writes to the file.
+// An Apk owns its facts, but not the descriptor that it is given. It never writes to the file. Its
+// end closes neither the archive nor the descriptor: the process ends right after the run.
 // Nothing fails by throwing: construction leaves flags that say how far it got, checks answer true
 // or false, and every failure is logged as an error where it is found, unless said otherwise. One
 // thread uses an object from its construction to its end.
 #pragma once
-
-#include <ziparchive/zip_archive.h>
 
 #include <cstdint>
 #include <string>
@@ -14,6 +13,7 @@
 
 #include "apk/entry_digests.h"
 #include "apk/manifest_mf.h"
+#include "apk/zip_library.h"
 #include "util/file.h"
 
 namespace ApkTools {
@@ -29,8 +29,6 @@ class Apk {
 
   // As Init(fd, nullptr) on an empty object.
   explicit Apk(int fd) { Init(fd, nullptr); }
-  // Closes neither the archive nor the descriptor: the process ends right after the run.
-  ~Apk() = default;
   Apk(const Apk&) = delete;
   Apk& operator=(const Apk&) = delete;
 
@@ -65,9 +63,13 @@ class Apk {
   // StartIteration stores a cookie for the entries whose names begin with `prefix` and end with
   // `suffix`; an empty text filters nothing. Next gives them one by one in the library's order, -1
   // at their end; `name` changes only with a result of 0. EndIteration releases the cookie.
-  int32_t StartIteration(void** cookie, const std::string& prefix, const std::string& suffix);
-  int32_t Next(void* cookie, ZipEntry* entry, std::string& name);
-  void EndIteration(void* cookie);
+  int32_t StartIteration(void** cookie, const std::string& prefix, const std::string& suffix) {
+    return StartZipIteration(zip_handle_, cookie, prefix, suffix);
+  }
+  int32_t Next(void* cookie, ZipEntry* entry, std::string& name) {
+    return NextZipEntry(cookie, entry, name);
+  }
+  void EndIteration(void* cookie) { ::EndIteration(cookie); }
 
   // The steps of Init that read more than the archive. Each answers whether it succeeded.
 
@@ -89,7 +91,7 @@ class Apk {
                   const std::vector<uint8_t>& data);
   // Reads the package name and the secure-storage permission from a compiled "AndroidManifest.xml".
   // False only when the bytes are no compiled XML at all; nothing changes then.
-  bool ParseAndroidManifest(const std::vector<uint8_t>& bytes);
+  bool ParseAndroidManifest(std::vector<uint8_t> bytes);
 
   // Whether the package verified, and its "classes.dex", if it has one, as well. The first call
   // checks that entry, later ones remember.
@@ -98,10 +100,10 @@ class Apk {
   // records for the name. A mismatch, and an entry that cannot be extracted, are not logged.
   bool VerifyEntryHash(const std::string& name, ZipEntry& entry);
   // Whether the file at `path` has the digest that the manifest records for the entry `name`. A
-  // mismatch is not logged. `state`, unless it is null, tells which file was read (ReadFile); it
-  // stays as it is when none was.
+  // mismatch is not logged. `state`, unless it is null, tells which file was read, and an `fd`
+  // other than -1 is the file itself (ReadFile). `state` stays as it is if no file was read.
   bool VerifyFileHash(const std::string& name, const std::string& path,
-                      struct stat* state = nullptr);
+                      struct stat* state = nullptr, int fd = -1);
   // Whether `name` is one of the signature's own files, which no manifest lists.
   bool CanSkipValidation(const std::string& name);
 
@@ -109,12 +111,11 @@ class Apk {
   bool FindFile(const char* path);
   bool OpenZip(bool own_fd);
   int32_t ExtractEntry(const std::string& name, std::vector<uint8_t>& out);
-  bool VerifyPackage(const std::vector<uint8_t>& android_manifest);
+  bool VerifyPackage(std::vector<uint8_t> android_manifest);
   bool ExtractSignatureFile(std::string& name, std::vector<uint8_t>& content);
   bool VerifyDex();
   template <typename ReadContent>
-  bool VerifyContent(const std::string& name, const std::vector<uint8_t>& content,
-                     ReadContent read_content);
+  bool VerifyContent(const std::string& name, ReadContent read_content);
 
   std::string path_;
   int fd_ = -1;
@@ -128,6 +129,9 @@ class Apk {
   std::vector<uint8_t> manufacturer_key_;
   bool ss_permission_required_ = false;
   std::string package_name_;
+  // Of the entry or file that was digested last. The memory is kept for the next one: to give it
+  // back and ask for it again costs 2 % of the time of large libraries.
+  std::vector<uint8_t> content_;
 };
 
 }  // namespace ApkTools

@@ -1,4 +1,4 @@
-// The archive: opening it, finding and extracting an entry, walking through all.
+// The archive: opening it, finding and extracting an entry.
 #include <fcntl.h>
 
 #include <cerrno>
@@ -51,15 +51,5 @@ int32_t Apk::ExtractEntry(const std::string& name, std::vector<uint8_t>& out) {
   if (result != 0) return result;
   return ExtractZipEntry(zip_handle_, &entry, out);
 }
-
-int32_t Apk::StartIteration(void** cookie, const std::string& prefix, const std::string& suffix) {
-  return StartZipIteration(zip_handle_, cookie, prefix, suffix);
-}
-
-int32_t Apk::Next(void* cookie, ZipEntry* entry, std::string& name) {
-  return NextZipEntry(cookie, entry, name);
-}
-
-void Apk::EndIteration(void* cookie) { ::EndIteration(cookie); }
 
 }  // namespace ApkTools

@@ -1,30 +1,12 @@
 #include "apk/base64.h"
 
+#include <string_view>
+
 namespace {
 
-// What a byte means, when it is not one of the values 0 to 63.
-constexpr uint8_t kSkip = 64;
-constexpr uint8_t kEnd = 65;
-constexpr uint8_t kInvalid = 66;
-
-struct Table {
-  uint8_t meaning[256];
-};
-
-constexpr Table MakeTable() {
-  constexpr char kAlphabet[] = "ABCDEFGHIJKLMNOPQRSTUVWXYZabcdefghijklmnopqrstuvwxyz0123456789+/";
-  Table table = {};
-  for (uint8_t& meaning : table.meaning) meaning = kInvalid;
-  for (uint8_t value = 0; value < 64; ++value) {
-    table.meaning[static_cast<uint8_t>(kAlphabet[value])] = value;
-  }
-  table.meaning[uint8_t{'\0'}] = table.meaning[uint8_t{'\n'}] = table.meaning[uint8_t{'\r'}] =
-      kSkip;
-  table.meaning[uint8_t{'='}] = kEnd;
-  return table;
-}
-
-constexpr Table kTable = MakeTable();
+// The place of each is its value.
+constexpr std::string_view kAlphabet =
+    "ABCDEFGHIJKLMNOPQRSTUVWXYZabcdefghijklmnopqrstuvwxyz0123456789+/";
 
 }  // namespace
 
@@ -37,32 +19,29 @@ std::vector<uint8_t> Base64Decode(const std::string& text) {
 }
 
 int base64decode(const char* in, size_t length, uint8_t* out, size_t* out_length) {
-  const size_t room = *out_length;
   size_t written = 0;
   uint32_t accumulator = 0;
-  int collected = 0;
-  for (size_t i = 0; i < length; ++i) {
-    const uint8_t meaning = kTable.meaning[static_cast<uint8_t>(in[i])];
-    if (meaning == kSkip) continue;
-    if (meaning == kEnd) break;
-    if (meaning == kInvalid) return 1;
-    accumulator = (accumulator << 6) | meaning;
-    if (++collected < 4) continue;
-    if (room - written < 3) return 1;
-    out[written++] = static_cast<uint8_t>(accumulator >> 16);
-    out[written++] = static_cast<uint8_t>(accumulator >> 8);
-    out[written++] = static_cast<uint8_t>(accumulator);
+  int collected = 0;  // values of 6 bits in the accumulator
+  // Writes the whole bytes of the accumulator, or none. Deliberate: the bits of no whole byte are
+  // dropped without an error, and so is a single value, which makes none.
+  const auto flush = [&] {
+    const size_t count = collected < 2 ? 0 : static_cast<size_t>(collected) - 1;
+    if (*out_length - written < count) return false;
+    for (int shift = 6 * collected - 8; shift >= 0; shift -= 8) {
+      out[written++] = static_cast<uint8_t>(accumulator >> shift);
+    }
     collected = 0;
+    return true;
+  };
+  for (size_t i = 0; i < length; ++i) {
+    if (in[i] == '\0' || in[i] == '\n' || in[i] == '\r') continue;
+    if (in[i] == '=') break;
+    const size_t value = kAlphabet.find(in[i]);
+    if (value == std::string_view::npos) return 1;
+    accumulator = accumulator << 6 | static_cast<uint32_t>(value);
+    if (++collected == 4 && !flush()) return 1;
   }
-  if (collected == 3) {
-    if (room - written < 2) return 1;
-    out[written++] = static_cast<uint8_t>(accumulator >> 10);
-    out[written++] = static_cast<uint8_t>(accumulator >> 2);
-  } else if (collected == 2) {
-    if (room - written < 1) return 1;
-    out[written++] = static_cast<uint8_t>(accumulator >> 4);
-  }
-  // Deliberate: a single value left over is 6 bits of no byte, and is dropped without an error.
+  if (!flush()) return 1;
   *out_length = written;
   return 0;
 }

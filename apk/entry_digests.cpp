@@ -1,6 +1,7 @@
 #include "apk/entry_digests.h"
 
 #include <algorithm>
+#include <functional>
 #include <utility>
 
 namespace ApkTools {
@@ -12,10 +13,13 @@ ManifestMf::Section::value_type DigestOf(const ManifestMf::Section& section) {
   return section.findLastEndingIn("-Digest");
 }
 
+size_t Hash(std::string_view name) { return std::hash<std::string_view>()(name); }
+
 }  // namespace
 
 bool EntryDigests::Load(std::vector<uint8_t> text) {
   sections_.clear();
+  hashes_.clear();
   return manifest_mf_.load(std::move(text));
 }
 
@@ -32,28 +36,45 @@ void EntryDigests::List() {
     last = name;
     sections_.push_back(i);
   }
-  // As most manifests have them.
+  // As apksigner writes them. Older tools write them in the order of the archive.
   if (!in_order) Sort();
 }
 
 bool EntryDigests::Find(std::string_view name, std::string& digest_name,
                         std::string& digest) const {
+  auto first = sections_.begin(), last = sections_.end();
+  if (!hashes_.empty()) {
+    const auto equal = std::equal_range(hashes_.begin(), hashes_.end(), Hash(name));
+    last = first + (equal.second - hashes_.begin());
+    first += equal.first - hashes_.begin();
+  }
   // The last of equal names: a later section replaces an earlier one.
   const auto next = std::upper_bound(
-      sections_.begin(), sections_.end(), name,
+      first, last, name,
       [this](std::string_view wanted, uint32_t section) { return wanted < NameOf(section); });
-  if (next == sections_.begin() || NameOf(next[-1]) != name) return false;
+  if (next == first || NameOf(next[-1]) != name) return false;
   const auto [attribute, value] = DigestOf(manifest_mf_.getSections()[next[-1]]);
   digest_name = attribute;
   digest = value;
   return true;
 }
 
+// By the hashes of the names, and by the names where those are equal: to compare names that lie all
+// over a text costs more than to read them once.
 void EntryDigests::Sort() {
-  std::vector<std::pair<std::string_view, uint32_t>> named;
-  for (const uint32_t section : sections_) named.emplace_back(NameOf(section), section);
-  std::sort(named.begin(), named.end());
-  for (size_t i = 0; i < named.size(); ++i) sections_[i] = named[i].second;
+  std::vector<std::pair<size_t, uint32_t>> hashed;
+  hashed.reserve(sections_.size());
+  for (const uint32_t section : sections_) hashed.emplace_back(Hash(NameOf(section)), section);
+  std::sort(hashed.begin(), hashed.end(), [this](const auto& a, const auto& b) {
+    if (a.first != b.first) return a.first < b.first;
+    const int order = NameOf(a.second).compare(NameOf(b.second));
+    return order != 0 ? order < 0 : a.second < b.second;
+  });
+  hashes_.reserve(hashed.size());
+  for (size_t i = 0; i < hashed.size(); ++i) {
+    hashes_.push_back(hashed[i].first);
+    sections_[i] = hashed[i].second;
+  }
 }
 
 std::string_view EntryDigests::NameOf(uint32_t section) const {

@@ -27,8 +27,10 @@ class EntryDigests {
 
   ManifestMf manifest_mf_;
   // The numbers of the sections that count, in byte order of the entries' names, those of equal
-  // names in the order of the text.
+  // names in the order of the text. Unless the text has them so, they are first of all in the order
+  // of the hashes of the names, which are then in hashes_.
   std::vector<uint32_t> sections_;
+  std::vector<size_t> hashes_;
 };
 
 }  // namespace ApkTools

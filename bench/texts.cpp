@@ -1,23 +1,25 @@
-// bench_texts: what the worst texts that a manifest can have cost ManifestMf, in memory and time. A
-// line for each text:
+// bench_texts: what the worst texts cost the readers of META-INF/MANIFEST.MF and of the compiled
+// Android manifest, in memory and time. A line for each text:
 //
-//   NAME <TAB> peak bytes for each byte of the text <TAB> nanoseconds for each byte
+//   READER <TAB> NAME <TAB> peak bytes for each byte of the text <TAB> nanoseconds for each byte
 //
 // The text itself is one of the bytes. Each is read in a process of its own, since the peak of a
 // process never falls.
-#include <sys/resource.h>
 #include <sys/wait.h>
 #include <unistd.h>
 
 #include <chrono>
 #include <cstdint>
 #include <cstdio>
-#include <cstdlib>
+#include <fstream>
+#include <iterator>
 #include <string>
 #include <utility>
 #include <vector>
 
+#include "apk/apk.h"
 #include "apk/manifest_mf.h"
+#include "support/compiled_manifest.h"
 
 namespace {
 
@@ -51,6 +53,12 @@ struct Text {
   std::vector<uint8_t> (*make)();
 };
 
+void ReadManifest(std::vector<uint8_t> text) { ManifestMf().load(std::move(text)); }
+
+void ReadAndroidManifest(std::vector<uint8_t> document) {
+  ApkTools::Apk(-1).ParseAndroidManifest(std::move(document));
+}
+
 constexpr Text kTexts[] = {
     {"one name, again and again", [] { return Repeat([](size_t) { return "A: 1\n"; }); }},
     {"a thousand names, again and again",
@@ -71,37 +79,94 @@ constexpr Text kTexts[] = {
     {"one name without end", [] { return Repeat([](size_t) { return "A"; }); }},
 };
 
-long PeakKilobytes() {
-  rusage usage = {};
-  getrusage(RUSAGE_SELF, &usage);
-  return usage.ru_maxrss;
+// What deflates to a thousandth.
+constexpr size_t kManyNodes = 1 << 20;
+constexpr size_t kLongName = 30000;
+
+template <typename PutNode>
+std::vector<uint8_t> Document(const PutNode& put_node) {
+  CompiledXml xml(CompiledXml::Pool::kUtf16);
+  for (size_t i = 0; i < kManyNodes; ++i) put_node(&xml);
+  return xml.Build();
 }
 
-void Measure(const Text& text) {
+constexpr Text kDocuments[] = {
+    {"elements of 65,535 attributes of size 0",
+     [] {
+       const XmlAttribute attribute = StringAttribute(std::string(kLongName, 'x'), "");
+       return Document([&](CompiledXml* xml) {
+         xml->StartWithSizelessAttributes("permission", attribute, 65535);
+       });
+     }},
+    {"elements of one long name",
+     [] {
+       const std::string name(kLongName, 'x');
+       return Document([&](CompiledXml* xml) { xml->Start(name); });
+     }},
+    {"namespaces of one long URI",
+     [] {
+       const std::string uri(kLongName, 'x');
+       return Document([&](CompiledXml* xml) { xml->StartNamespace("", uri); });
+     }},
+};
+
+struct Reader {
+  const char* name;
+  void (*read)(std::vector<uint8_t> text);
+  const Text* texts;
+  size_t count;
+};
+
+constexpr Reader kReaders[] = {
+    {"`ManifestMf::load` of 64 MiB", ReadManifest, kTexts, std::size(kTexts)},
+    {"`ParseAndroidManifest` of 25 to 57 MB", ReadAndroidManifest, kDocuments,
+     std::size(kDocuments)},
+};
+
+// The most memory that the process has had since its peak was reset.
+long PeakKilobytes() {
+  std::ifstream status("/proc/self/status");
+  for (std::string word; status >> word;) {
+    if (long kilobytes; word == "VmHWM:" && status >> kilobytes) return kilobytes;
+  }
+  return 0;
+}
+
+// What it took to make the text does not count.
+void ResetPeak() { std::ofstream("/proc/self/clear_refs") << "5"; }
+
+void Measure(const Reader& reader, const Text& text) {
   using Clock = std::chrono::steady_clock;
   std::vector<uint8_t> bytes = text.make();
   const double size = static_cast<double>(bytes.size());
+  ResetPeak();
   const auto start = Clock::now();
-  ManifestMf manifest;
-  manifest.load(std::move(bytes));
+  reader.read(std::move(bytes));
   const std::chrono::duration<double, std::nano> time = Clock::now() - start;
-  printf("%s\t%.2f\t%.2f\n", text.name, static_cast<double>(PeakKilobytes()) * 1024 / size,
-         time.count() / size);
+  printf("%s\t%s\t%.2f\t%.2f\n", reader.name, text.name,
+         static_cast<double>(PeakKilobytes()) * 1024 / size, time.count() / size);
+}
+
+// In a process of its own; false if that failed.
+bool MeasureApart(const Reader& reader, const Text& text) {
+  fflush(stdout);
+  const pid_t child = fork();
+  if (child == 0) {
+    Measure(reader, text);
+    fflush(stdout);
+    _exit(0);
+  }
+  int status = 1;
+  return child > 0 && waitpid(child, &status, 0) == child && status == 0;
 }
 
 }  // namespace
 
 int main() {
-  for (const Text& text : kTexts) {
-    fflush(stdout);
-    const pid_t child = fork();
-    if (child == 0) {
-      Measure(text);
-      return 0;
-    }
-    int status = 1;
-    if (child < 0 || waitpid(child, &status, 0) != child || status != 0) {
-      fprintf(stderr, "bench_texts: %s: failed\n", text.name);
+  for (const Reader& reader : kReaders) {
+    for (size_t i = 0; i < reader.count; ++i) {
+      if (MeasureApart(reader, reader.texts[i])) continue;
+      fprintf(stderr, "bench_texts: %s: failed\n", reader.texts[i].name);
       return 1;
     }
   }

@@ -216,7 +216,6 @@ WRAPS_ON_PURPOSE void mpi_montmul(mpi* A, const mpi* B, const mpi* N, unsigned i
     mpi_mul_hlp(n, N->p, d, u1);
     // The two rows made this limb zero, so that it can hold another value.
     *d++ = u0;
-    d[n + 1] = 0;
   }
   for (int i = 0; i <= n; ++i) A->p[i] = d[i];
 

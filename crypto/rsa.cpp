@@ -26,8 +26,8 @@ constexpr uint8_t kSha256Prefix[] = {0x30, 0x31, 0x30, 0x0d, 0x06, 0x09, 0x60, 0
 void set_exponent(mpi* E, uint32_t exponent_value);
 int public_operation(const rsa_context* ctx, const uint8_t* sig, uint8_t* em);
 uint8_t* skip_padding(uint8_t* em, size_t len);
-int check_sha256(const uint8_t* info, const uint8_t* sha256);
-int check_sha1(const uint8_t* info, const uint8_t* sha1);
+bool holds(const uint8_t* info, const uint8_t* prefix, size_t prefix_size, const uint8_t* digest,
+           size_t size);
 int check_md5(uint8_t* info, const uint8_t* md5);
 int invalid_padding();
 
@@ -60,11 +60,18 @@ int rsa_pkcs1_verify(const rsa_context* ctx, const uint8_t* sha1, const uint8_t*
 
   uint8_t* const info = skip_padding(em, len);
   if (info == nullptr) return kRsaInvalidPadding;
+  // Deliberate: here and below the texts keep their spelling and end without a line break. Programs
+  // that parse the log match on them.
   switch (em + len - info) {
     case sizeof(kSha256Prefix) + kSha256Size:
-      return check_sha256(info, sha256);
+      if (sha256 == nullptr) return invalid_padding();
+      if (holds(info, kSha256Prefix, sizeof(kSha256Prefix), sha256, kSha256Size)) return 0;
+      LogError("SHA256 hash does not match");
+      return kRsaVerifyFailed;
     case sizeof(kSha1Prefix) + kSha1Size:
-      return check_sha1(info, sha1);
+      if (holds(info, kSha1Prefix, sizeof(kSha1Prefix), sha1, kSha1Size)) return 0;
+      LogError("SHA hash check unsuccessfull");
+      return kRsaVerifyFailed;
     case sizeof(kMdPrefix) + kMd5Size:
       return check_md5(info, md5);
     default:
@@ -107,25 +114,10 @@ uint8_t* skip_padding(uint8_t* em, size_t len) {
   return em + i + 1;
 }
 
-// Deliberate: here and below the texts stay as readers of the log know them, spelling included, and
-// end without a line break.
-int check_sha256(const uint8_t* info, const uint8_t* sha256) {
-  if (sha256 == nullptr) return invalid_padding();
-  if (memcmp(info, kSha256Prefix, sizeof(kSha256Prefix)) == 0 &&
-      memcmp(info + sizeof(kSha256Prefix), sha256, kSha256Size) == 0) {
-    return 0;
-  }
-  LogError("SHA256 hash does not match");
-  return kRsaVerifyFailed;
-}
-
-int check_sha1(const uint8_t* info, const uint8_t* sha1) {
-  if (memcmp(info, kSha1Prefix, sizeof(kSha1Prefix)) == 0 &&
-      memcmp(info + sizeof(kSha1Prefix), sha1, kSha1Size) == 0) {
-    return 0;
-  }
-  LogError("SHA hash check unsuccessfull");
-  return kRsaVerifyFailed;
+// True if the DigestInfo at `info` is this prefix and then this digest.
+bool holds(const uint8_t* info, const uint8_t* prefix, size_t prefix_size, const uint8_t* digest,
+           size_t size) {
+  return memcmp(info, prefix, prefix_size) == 0 && memcmp(info + prefix_size, digest, size) == 0;
 }
 
 // Deliberate: of the three algorithms that share the prefix only MD5 is known, and a difference in

@@ -165,6 +165,11 @@ void MakeCompiledManifests() {
         .EndNamespace("android", kAndroidNamespace);
     Seed("compiled_manifest", pool == CompiledXml::Pool::kUtf8 ? "utf-8" : "utf-16", xml.Build());
   }
+  CompiledXml odd(CompiledXml::Pool::kUtf16);
+  odd.StartWithSizelessAttributes("manifest", StringAttribute("package\xED\xB0\x80", "p"), 100)
+      .Element("permission\xED\xA0\x80",
+               {StringAttribute("name", "com.qix.android.\xED\xA0\x80SECURE_STORAGE")});
+  Seed("compiled_manifest", "odd", odd.Build());
   Seed("compiled_manifest", "no-header", {3});
   Seed("compiled_manifest", "bad-node", CompiledXml().Start("manifest").BadNode().Build());
 }

@@ -1,13 +1,13 @@
 // One file, three steps: sign its native libraries, sign the file itself, register its signer.
 // Nothing is printed here; the exit status only tells a usage error (1) from everything else (0),
 // and the Android log is the only record of what was signed and what was refused.
-#include <fcntl.h>
 #include <sys/statvfs.h>
 #include <unistd.h>
 
 #include "apk/apk.h"
 #include "sign/registration.h"
 #include "sign/signing.h"
+#include "util/file.h"
 
 namespace {
 
@@ -21,9 +21,8 @@ bool IsOnReadOnlyFileSystem(int fd) {
 
 int main(int argc, char* argv[]) {
   if (argc != 2) return 1;
-  // Deliberate: without waiting. A FIFO is a file that is no archive, and not one to wait for until
-  // somebody writes to it.
-  const int fd = open(argv[1], O_RDONLY | O_NONBLOCK);
+  // Deliberate: without waiting for a FIFO's writer. It is a file that is no archive.
+  const int fd = OpenForReading(argv[1], 0);
   // Deliberate: descriptor 0 is refused like a failed open. A caller that closed standard input
   // did not set this process up as the install path does.
   if (fd < 1) return 0;

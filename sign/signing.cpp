@@ -21,8 +21,7 @@ uint32_t VeltSignOat(ApkTools::Apk& apk, int fd);
 uint32_t SignAsPackage(ApkTools::Apk& apk, int fd);
 uint32_t SignAsJar(ApkTools::Apk& apk, int fd);
 std::vector<uint8_t> SignPayload(const std::vector<uint8_t>& data);
-void SignLibrary(ApkTools::Apk& apk, const std::string& entry_name, const std::string& target);
-void ReportNotVerified(const std::string& target);
+bool SignLibrary(ApkTools::Apk& apk, const std::string& entry_name, const std::string& target);
 
 }  // namespace
 
@@ -50,7 +49,8 @@ uint32_t VeltSignJni(ApkTools::Apk& apk, int fd, const char* /*path*/) {
   std::string name;
   while (apk.Next(cookie, &entry, name) == 0) {
     const std::string target = ApkTools::InstalledLibraryPath(apk.GetPath(), name);
-    if (!target.empty()) SignLibrary(apk, name, target);
+    if (target.empty() || SignLibrary(apk, name, target)) continue;
+    LogError("VeltSignJni: File not verified: %s\n", target.c_str());
   }
   apk.EndIteration(cookie);
   // Deliberate: a library that was refused does not change the result; its own message tells.
@@ -111,30 +111,33 @@ std::vector<uint8_t> SignPayload(const std::vector<uint8_t>& data) {
   return payload;
 }
 
-void SignLibrary(ApkTools::Apk& apk, const std::string& entry_name, const std::string& target) {
-  struct stat verified = {};
-  if (!apk.VerifyFileHash(entry_name, target, &verified)) return ReportNotVerified(target);
+// Returns false if nobody vouches for the file. Every other failure is logged here.
+bool SignLibrary(ApkTools::Apk& apk, const std::string& entry_name, const std::string& target) {
+  struct stat read = {};
+  if (!apk.VerifyFileHash(entry_name, target, &read)) return false;
 
-  // Without waiting, should `target` be a FIFO by now.
-  const ScopedFd library(open(target.c_str(), O_RDONLY | O_NONBLOCK));
+  const ScopedFd library(OpenForReading(target.c_str(), 0));
   if (library.get() < 0) {
     const int error = errno;
-    // Deliberate: without a line end, as readers of the log know it.
+    // Deliberate: without a line end. Programs that parse the log match on the text.
     LogError("File %s is not opened", target.c_str());
     LogError("Error %d: %s.\n", error, strerror(error));
-    return;
+    return true;
   }
-  // Deliberate: signed is only the very file whose bytes were verified, and with the times that it
-  // had. An entry's name may lead into a folder that others write to
-  // (docs/decisions/the-file-that-was-read.md).
+  // Deliberate: a file is signed only if its state, as fstat tells it, is still what it was before
+  // its bytes were digested. An entry's name may lead into a directory that others write to, so
+  // `target` may be another file by now. A file that was exchanged, or only touched, is digested
+  // again, now through the descriptor that is signed (docs/decisions/the-file-that-was-read.md).
+  constexpr int kMostDigests = 3;
   struct stat opened = {};
   fstat(library.get(), &opened);
-  if (!IsSameFile(verified, opened)) return ReportNotVerified(target);
+  for (int digests = 1; !IsSameFile(read, opened); ++digests) {
+    if (digests == kMostDigests || !S_ISREG(opened.st_mode)) return false;
+    if (!apk.VerifyFileHash(entry_name, target, &read, library.get())) return false;
+    fstat(library.get(), &opened);
+  }
   VeltSignOat(apk, library.get());
-}
-
-void ReportNotVerified(const std::string& target) {
-  LogError("VeltSignJni: File not verified: %s\n", target.c_str());
+  return true;
 }
 
 }  // namespace

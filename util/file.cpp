@@ -12,47 +12,57 @@
 
 namespace {
 
-constexpr ssize_t kUnknownSize = -1;
-
+std::string DescriptorLink(int fd);
 ssize_t FindSize(int fd, struct stat* state);
 void ReadBytes(int fd, std::vector<uint8_t>& out);
 
 }  // namespace
 
 bool IsSameFile(const struct stat& before, const struct stat& after) {
-  const auto same = [](const timespec& a, const timespec& b) {
-    return a.tv_sec == b.tv_sec && a.tv_nsec == b.tv_nsec;
-  };
   return S_ISREG(before.st_mode) && S_ISREG(after.st_mode) && before.st_dev == after.st_dev &&
          before.st_ino == after.st_ino && before.st_size == after.st_size &&
-         same(before.st_mtim, after.st_mtim) && same(before.st_ctim, after.st_ctim);
+         before.st_mtim.tv_sec == after.st_mtim.tv_sec &&
+         before.st_mtim.tv_nsec == after.st_mtim.tv_nsec &&
+         before.st_ctim.tv_sec == after.st_ctim.tv_sec &&
+         before.st_ctim.tv_nsec == after.st_ctim.tv_nsec;
 }
 
-bool ReadFile(const std::string& path, std::vector<uint8_t>& out, struct stat* state) {
-  const ScopedFd fd(open(path.c_str(), O_RDONLY | O_NONBLOCK | O_CLOEXEC));
-  if (fd.get() < 0) {
+int OpenForReading(const char* path, int flags) {
+  const int fd = open(path, O_RDONLY | O_NONBLOCK | flags);
+  if (fd >= 0 || errno != EWOULDBLOCK) return fd;
+  // Another process holds a lease. The holder must not get the time to put a FIFO in the file's
+  // place, so the file is pinned first, and opened through its descriptor.
+  const ScopedFd pinned(open(path, O_PATH | O_CLOEXEC));
+  struct stat state = {};
+  if (pinned.get() < 0 || fstat(pinned.get(), &state) != 0 || !S_ISREG(state.st_mode)) return -1;
+  return open(DescriptorLink(pinned.get()).c_str(), O_RDONLY | flags);
+}
+
+bool ReadFile(const std::string& path, std::vector<uint8_t>& out, struct stat* state, int fd) {
+  const ScopedFd opened(fd == -1 ? OpenForReading(path.c_str(), O_CLOEXEC) : -1);
+  if (fd == -1) fd = opened.get();
+  if (fd < 0) {
     LogError("Can't open file: %s\n", path.c_str());
     return false;
   }
   struct stat found;
-  const ssize_t size = FindSize(fd.get(), &found);
+  const ssize_t size = FindSize(fd, &found);
   if (size < 0) {
     LogError("Can't read file: %s (streamoff=%zd)\n", path.c_str(), size);
     return false;
   }
-  out.reserve(static_cast<size_t>(size));
+  if (out.empty() && out.capacity() < static_cast<size_t>(size)) std::vector<uint8_t>().swap(out);
   out.resize(static_cast<size_t>(size));
   // Deliberate: a file that shrinks meanwhile is no failure. It leaves the end of `out` as it is,
   // whose digest, which every caller takes, then is not the expected one.
-  ReadBytes(fd.get(), out);
+  ReadBytes(fd, out);
   if (state != nullptr) *state = found;
   return true;
 }
 
 std::string GetFilenameByFd(int fd) {
-  const std::string link = "/proc/self/fd/" + std::to_string(fd);
   char path[4096] = {};
-  if (readlink(link.c_str(), path, sizeof(path) - 1) == -1) return std::string();
+  if (readlink(DescriptorLink(fd).c_str(), path, sizeof(path) - 1) == -1) return std::string();
   return path;
 }
 
@@ -60,21 +70,23 @@ std::vector<uint8_t> StringToVector(const std::string& s) { return {s.begin(), s
 
 namespace {
 
+// The link in /proc that leads to the file that `fd` is open on, whatever its path leads to now.
+std::string DescriptorLink(int fd) { return "/proc/self/fd/" + std::to_string(fd); }
+
 // The size in bytes of the regular file `fd`, whose position is then its start again, and its state
-// before.
+// before. -1 if there is no such size, or none that fits in memory.
 ssize_t FindSize(int fd, struct stat* state) {
-  if (fstat(fd, state) != 0 || !S_ISREG(state->st_mode)) return kUnknownSize;
+  if (fstat(fd, state) != 0 || !S_ISREG(state->st_mode)) return -1;
   const off_t size = lseek(fd, 0, SEEK_END);
-  if (size < 0 || !FitsInMemory(static_cast<size_t>(size))) return kUnknownSize;
-  return lseek(fd, 0, SEEK_SET) == 0 ? size : kUnknownSize;
+  if (size < 0 || !FitsInMemory(static_cast<size_t>(size))) return -1;
+  return lseek(fd, 0, SEEK_SET) == 0 ? size : -1;
 }
 
 // Fills `out` from `fd`, as far as there is something to read.
 void ReadBytes(int fd, std::vector<uint8_t>& out) {
   size_t done = 0;
   while (done < out.size()) {
-    const ssize_t count = read(fd, out.data() + done, out.size() - done);
-    if (count == -1 && errno == EINTR) continue;
+    const ssize_t count = TEMP_FAILURE_RETRY(read(fd, out.data() + done, out.size() - done));
     if (count <= 0) break;
     done += static_cast<size_t>(count);
   }

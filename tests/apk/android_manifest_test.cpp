@@ -1,6 +1,8 @@
 // What is read from the compiled Android manifest.
 #include <gtest/gtest.h>
 
+#include <algorithm>
+
 #include "apk/apk.h"
 #include "support/compiled_manifest.h"
 #include "support/log_capture.h"
@@ -249,6 +251,69 @@ TEST(AndroidManifestAttribute, ALoneStringWithoutTextIsMissing) {
 
 // ---- Documents that are not as they should be.
 
+// ---- Unpaired surrogates, which the platform drops when it converts a text to UTF-8. Names and
+// values are not converted here, but read as if they were.
+
+const std::string kHigh = "\xED\xA0\x80", kLow = "\xED\xB0\x80";  // U+D800, U+DC00
+
+std::string Times(size_t count, const std::string& text) {
+  std::string all;
+  while (count-- > 0) all += text;
+  return all;
+}
+
+// What the platform's conversion makes of the text.
+std::string Converted(const std::string& text) {
+  CompiledXml xml(CompiledXml::Pool::kUtf16);
+  return Read(xml.Element("manifest", {Package(text)})).package_name;
+}
+
+TEST(AndroidManifestSurrogates, AreDroppedFromNamesAndValuesAsByTheConversion) {
+  const std::string pair = "\U00010000";
+  for (const std::string& before : {kHigh, kLow, kHigh + kHigh, kLow + kHigh, kHigh + pair, pair}) {
+    for (const size_t at : {0, 3, 15}) {
+      const auto with = [&](std::string text) {
+        return text.insert(std::min(at, text.size()), before);
+      };
+      const bool is_dropped = Converted(with("uses-permission")) == "uses-permission";
+      EXPECT_EQ(is_dropped, before.find(pair) == std::string::npos);
+      CompiledXml xml(CompiledXml::Pool::kUtf16);
+      xml.Element(with("uses-permission"), {StringAttribute(with("name"), with(kPermission))});
+      EXPECT_EQ(Read(xml).ss_permission_required, is_dropped) << before << at;
+      CompiledXml other(CompiledXml::Pool::kUtf16);
+      other.Element("manifest", {StringAttribute(with("package"), "p")});
+      EXPECT_EQ(Read(other).package_name, is_dropped ? "p" : "") << before << at;
+    }
+  }
+}
+
+TEST(AndroidManifestSurrogates, AShorterNameIsAnotherHoweverManyAreInIt) {
+  CompiledXml xml(CompiledXml::Pool::kUtf16);
+  xml.Element("manifes" + kHigh + kHigh, {Package("p")});
+  EXPECT_EQ(Read(xml), (Facts{"", false}));
+}
+
+// Or a hostile document could make each comparison as long as itself.
+TEST(AndroidManifestSurrogates, MoreThanSixteenMakeAnotherName) {
+  for (const size_t count : {16, 17}) {
+    CompiledXml xml(CompiledXml::Pool::kUtf16);
+    xml.Element("manifest" + Times(count, kLow), {Package("p")});
+    EXPECT_EQ(Read(xml), (Facts{count == 16 ? "p" : "", false}));
+  }
+}
+
+TEST(AndroidManifestSurrogates, APackageNameOfNothingElseLeavesRoomForASecondManifest) {
+  CompiledXml xml(CompiledXml::Pool::kUtf16);
+  xml.Element("manifest", {Package(Times(40, kHigh))}).Element("manifest", {Package("b")});
+  EXPECT_EQ(Read(xml), (Facts{"b", false}));
+}
+
+TEST(AndroidManifestSurrogates, APackageNameLosesAnyNumberOfThem) {
+  CompiledXml xml(CompiledXml::Pool::kUtf16);
+  xml.Element("manifest", {Package(Times(40, kHigh) + "a" + Times(40, kLow))});
+  EXPECT_EQ(Read(xml), (Facts{"a", false}));
+}
+
 TEST(AndroidManifestDocument, BytesThatAreNotCompiledXmlFail) {
   LogCapture log;
   Apk apk(-1);
@@ -310,6 +375,26 @@ TEST(AndroidManifestDocument, OneThatIsCutShortAnywhereIsReadOrRefusedWithoutHar
   }
   EXPECT_GT(read, 0u);
   EXPECT_LT(read, whole.size());
+}
+
+// Replaces the one place where the document has these bytes.
+Bytes Replaced(Bytes document, const Bytes& old_bytes, const Bytes& new_bytes) {
+  const auto at = std::search(document.begin(), document.end(), old_bytes.begin(), old_bytes.end());
+  EXPECT_NE(at, document.end());
+  std::copy(new_bytes.begin(), new_bytes.end(), at);
+  return document;
+}
+
+// The platform's library then has no text for it, and yet a length.
+TEST(AndroidManifestDocument, AnElementWhoseNameDoesNotEndIsPassedOver) {
+  CompiledXml xml;
+  xml.Element("manifest", {Package("a")}).Element("permission", {AndroidName(kPermission)});
+  const Bytes bad = Replaced(xml.Build(), {8, 8, 'm', 'a'}, {8, 9, 'm', 'a'});
+  LogCapture log;
+  Apk apk(-1);
+  EXPECT_TRUE(apk.ParseAndroidManifest(bad));
+  EXPECT_EQ(apk.GetPackageName(), "");
+  EXPECT_TRUE(apk.IsSsPermissionRequired());
 }
 
 TEST(AndroidManifestDocument, AnElementWithoutNameIsPassedOver) {

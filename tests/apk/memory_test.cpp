@@ -10,6 +10,7 @@
 #include <random>
 
 #include "support/jar.h"
+#include "support/little_endian.h"
 #include "support/log_capture.h"
 #include "support/open_package.h"
 
@@ -109,6 +110,46 @@ TEST(ApkMemory, NamesThatRepeatTakeNoneAfterManySections) {
   const long growth = GrowthWithSignatureFile(sections);
   EXPECT_LT(GrowthWithSignatureFile(sections + Repeat("A: 1\n", 4000000)),
             growth + 30 * kMegabyte + kKept);
+}
+
+// A document whose string pool has UTF-8 strings that lie over one another: each starts with its
+// two lengths, which are text to the strings before it, and all end with the pool's last byte. An
+// element of each name asks the platform's library for a copy of its own in UTF-16.
+Bytes DocumentOfOverlappingStrings() {
+  constexpr uint32_t kText = 16000, kHeader = 28;
+  Bytes text(kText, 'a'), offsets, elements;
+  uint32_t count = 0;
+  for (uint32_t at = 0; at + 4 < kText; at += 4) {
+    const uint32_t length = kText - 1 - (at + 4);
+    if ((length & 0xff) == 0 || (length & 0xff) > 0x7f) continue;  // no byte of ASCII
+    for (uint32_t i = 0; i < 4; i += 2) {
+      text[at + i] = static_cast<uint8_t>(0x80 | length >> 8);
+      text[at + i + 1] = static_cast<uint8_t>(length & 0xff);
+    }
+    Put32(offsets, at);
+    for (const uint32_t word : {0x00100102u, 36u, 1u, ~0u, ~0u, count++, 0x00140014u, 0u, 0u}) {
+      Put32(elements, word);
+    }
+  }
+  text.back() = 0;
+  Bytes pool;
+  for (const uint32_t word :
+       {0x001c0001u, static_cast<uint32_t>(kHeader + offsets.size() + kText), count, 0u, 0x100u,
+        static_cast<uint32_t>(kHeader + offsets.size()), 0u}) {
+    Put32(pool, word);
+  }
+  Bytes document;
+  Put32(document, 0x00080003);
+  Put32(document,
+        static_cast<uint32_t>(8 + pool.size() + offsets.size() + text.size() + elements.size()));
+  return Concat({document, pool, offsets, text, elements});
+}
+
+// The library keeps what it converts. The tool cannot tell beforehand what a name will take.
+TEST(ApkMemory, OverlappingStringsOfTheAndroidManifestTakeMuchOfThePlatformsMemory) {
+  const Bytes document = DocumentOfOverlappingStrings();
+  const long growth = PeakGrowth([&] { return ApkTools::Apk(-1).ParseAndroidManifest(document); });
+  EXPECT_GT(growth * 1024, 100 * static_cast<long>(document.size()));
 }
 
 // One library at a time, whichever way their sizes go.

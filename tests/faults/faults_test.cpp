@@ -58,7 +58,8 @@ class Installed {
   struct Outcome {
     ToolEnd ending;
     bool failed;  // the call that was to fail was made
-    // What was granted, a letter each, in their order: the library, the package and its key; a JAR.
+    // What was granted, a letter each, in their order: the library, the package and its key (N:
+    // under an empty name); a JAR.
     std::string grants;
     std::string errors;
   };
@@ -91,10 +92,14 @@ class Installed {
       if (NumberOf(event, "result") != 0) continue;
       const std::string what = TextOf(event, "event");
       if (what == "sign") grants += Signed(event, file);
-      if (what == "register")
-        grants += TextOf(event, "data") == Hex(ModulusOf("rsa-2048")) ? "K" : "?";
+      if (what == "register") grants += Registered(event);
     }
     return grants;
+  }
+
+  static std::string Registered(const nlohmann::json& event) {
+    if (TextOf(event, "data") != Hex(ModulusOf("rsa-2048"))) return "?";
+    return TextOf(event, "name").empty() ? "N" : "K";
   }
 
   static std::string Signed(const nlohmann::json& event, const std::string& file) {
@@ -245,8 +250,8 @@ void ExpectRunsWithoutMemory(Installed& file, const std::string& all,
 TEST(FaultsOfMemory, CostAGoodPackageWhatComesAfter) {
   Installed file = GoodPackage();
   // Nothing verified; no stream for the integrity value, before either signing; no text for the
-  // permission; a lack that is made up for.
-  ExpectRunsWithoutMemory(file, "LPK", {"", "PK", "LK", "LP", "LPK"});
+  // permission, or for the package's name, which then read as empty; a lack that is made up for.
+  ExpectRunsWithoutMemory(file, "LPK", {"", "PK", "LK", "LP", "LPN", "LPK"});
 }
 
 TEST(FaultsOfMemory, CostATrustedJarWhatComesAfter) {

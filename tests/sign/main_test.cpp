@@ -4,6 +4,7 @@
 #include <sys/stat.h>
 
 #include "support/files.h"
+#include "support/lease.h"
 #include "support/package.h"
 #include "support/process.h"
 #include "support/simulation.h"
@@ -42,6 +43,16 @@ TEST(Main, AFifoIsNoArchiveAndNothingToWaitFor) {
   EXPECT_TRUE(Says(run, "OpenArchiveFd(3) [file: " + folder / "fifo" + "] returned: "))
       << run.errors;
   EXPECT_TRUE(Says(run, "Zip archive is not valid for fd=3")) << run.errors;
+}
+
+TEST(Main, ALeasedFileIsWorkedOnOnceItsHolderGivesItUp) {
+  const DiskFile file(MakePackage(WithLibraries({})).Build());
+  const Lease lease(file.path());
+  if (!lease.IsHeld()) GTEST_SKIP() << "the file system of " << file.path() << " knows no leases";
+  const ProcessResult run = RunTool("timeout 20 \"$0\" \"$1\" </dev/null", file.path());
+  EXPECT_EQ(run.status, 0);
+  EXPECT_TRUE(lease.WasGivenUp());
+  EXPECT_TRUE(Says(run, "VeltSignJni finished: 0.")) << run.errors;
 }
 
 // The line is written when the process ends, after the steps.

@@ -4,69 +4,14 @@
 
 #include <fcntl.h>
 #include <gtest/gtest.h>
-#include <openssl/sha.h>
 #include <unistd.h>
 
 #include <cerrno>
-#include <cstring>
 
 #include "sign/integrity.h"
-#include "support/files.h"
-#include "support/log_capture.h"
-#include "support/package.h"
-#include "support/phone.h"
+#include "sign/package_on_phone.h"
 
 namespace {
-
-using Events = std::vector<std::string>;
-
-constexpr char kSelf[] = "integrity /proc/self/integrity/value";
-
-// The payload of every package signed with the key "rsa-2048": the length 32, then the digest of
-// its modulus by libcrypto.
-std::string PackagePayload() {
-  const Bytes modulus = ModulusOf("rsa-2048");
-  uint8_t digest[SHA256_DIGEST_LENGTH];
-  SHA256(modulus.data(), modulus.size(), digest);
-  return "2000" + Hex(digest, sizeof(digest));
-}
-
-std::string SignEvent(int fd) { return "sign " + std::to_string(fd) + " " + PackagePayload(); }
-
-ZipItem Library(const std::string& name) { return {name, ToBytes("\177ELF " + name)}; }
-
-// A package in a folder of its own, opened as the driver does, with the log and the phone ready.
-class PackageOnPhone {
- public:
-  explicit PackageOnPhone(const Package& package, const std::string& directory = "")
-      : path_(temp_.File(directory + "base.apk")) {
-    package.WriteTo(path_);
-    fd_ = open(path_.c_str(), O_RDONLY);
-    apk_.emplace(fd_);
-    log.Clear();
-  }
-  ~PackageOnPhone() { close(fd_); }
-
-  // Puts the item's bytes on disk, at `path` in the package's folder.
-  void Install(const std::string& path, const ZipItem& item) const { temp_.Write(path, item.data); }
-  std::string Path(const std::string& path) const { return temp_ / path; }
-
-  uint32_t SignJni() { return VeltSignJni(*apk_, fd_, "not used"); }
-  uint32_t Sign() { return VeltSign(*apk_, fd_, fd_); }
-
-  ApkTools::Apk& apk() { return *apk_; }
-  int fd() const { return fd_; }
-  const std::string& path() const { return path_; }
-
-  LogCapture log;
-  Phone phone;
-
- private:
-  TempDir temp_;
-  std::string path_;
-  int fd_;
-  std::optional<ApkTools::Apk> apk_;
-};
 
 Package BadPackage() {
   Package package = MakePackage();
@@ -74,8 +19,6 @@ Package BadPackage() {
   return package;
 }
 
-LogRecord Starts(int fd) { return Info("VeltSignJni starts: " + std::to_string(fd) + ".\n"); }
-LogRecord Finished() { return Info("VeltSignJni finished: 0.\n"); }
 LogRecord SignStarts(int fd) {
   const std::string text = std::to_string(fd);
   return Info("VeltSign starts: zip_fd = " + text + ", fd = " + text + ".\n");
@@ -378,37 +321,14 @@ TEST(VeltSignJni, ARefusalOfTheKernelDoesNotChangeTheResult) {
                      Finished()}));
 }
 
-// By then the file is another one: nothing is signed, and nothing stays open.
-TEST(VeltSignJni, ALibraryThatIsAnotherFileAfterItsCheckIsNotSigned) {
-  const ZipItem library = Library("lib/arm64-v8a/libfoo.so");
-  PackageOnPhone file(MakePackage(WithLibraries({library})));
-  file.Install("lib/arm64/libfoo.so", library);
-  file.Install("other", library);
-  int opens = 0;
-  file.phone.before_open = [&](const char* path, int) {
-    if (++opens < 2) return;
-    EXPECT_EQ(rename(file.Path("other").c_str(), path), 0);
-  };
-  const int next = dup(0);
-  close(next);
-  EXPECT_EQ(file.SignJni(), 0U);
-  EXPECT_EQ(dup(0), next);
-  close(next);
-  EXPECT_EQ(file.phone.events, Events());
-  EXPECT_EQ(
-      file.log.records(),
-      Records({Starts(file.fd()),
-               Error("VeltSignJni: File not verified: " + file.Path("lib/arm64/libfoo.so") + "\n"),
-               Finished()}));
-}
-
 // The file goes away between the check and the opening: the reading of the file is the only open
 // that succeeds.
 TEST(VeltSignJni, ALibraryThatCannotBeOpenedAfterItsCheckIsReportedWithItsErrno) {
   const ZipItem library = Library("lib/arm64-v8a/libfoo.so");
   PackageOnPhone file(MakePackage(WithLibraries({library})));
   file.Install("lib/arm64/libfoo.so", library);
-  file.phone.opens_before_failure = 1;
+  int opens = 0;
+  file.phone.open_error = [&](const char*, int) { return ++opens < 2 ? 0 : ENOENT; };
   EXPECT_EQ(file.SignJni(), 0U);
   EXPECT_EQ(file.phone.events, Events());
   EXPECT_EQ(file.log.records(),

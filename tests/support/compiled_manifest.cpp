@@ -120,17 +120,16 @@ CompiledXml& CompiledXml::EndNamespace(const std::string& prefix, const std::str
 
 CompiledXml& CompiledXml::Start(const std::string& name,
                                 const std::vector<XmlAttribute>& attributes) {
-  constexpr uint16_t kElementLength = 20;
-  PutNodeHeader(kStartElement, kElementLength + kAttributeLength * attributes.size());
-  Put32(nodes_, kNone);  // namespace
-  Put32(nodes_, Ref(name));
-  Put16(nodes_, kElementLength);  // where the attributes start
-  Put16(nodes_, kAttributeLength);
-  Put16(nodes_, static_cast<uint16_t>(attributes.size()));
-  Put16(nodes_, 0);  // id
-  Put16(nodes_, 0);  // class
-  Put16(nodes_, 0);  // style
+  PutStartTag(name, kAttributeLength * attributes.size(), kAttributeLength, attributes.size());
   for (const XmlAttribute& attribute : attributes) PutAttribute(attribute);
+  return *this;
+}
+
+CompiledXml& CompiledXml::StartWithSizelessAttributes(const std::string& name,
+                                                      const XmlAttribute& attribute,
+                                                      uint16_t count) {
+  PutStartTag(name, kAttributeLength, 0, count);
+  PutAttribute(attribute);
   return *this;
 }
 
@@ -200,6 +199,20 @@ void CompiledXml::PutNodeHeader(uint16_t type, size_t extra_length) {
   PutChunkHeader(nodes_, type, kNodeHeaderLength, kNodeHeaderLength + extra_length);
   Put32(nodes_, 1);      // line
   Put32(nodes_, kNone);  // comment
+}
+
+void CompiledXml::PutStartTag(const std::string& name, size_t attributes_length,
+                              uint16_t attribute_length, size_t count) {
+  constexpr uint16_t kElementLength = 20;
+  PutNodeHeader(kStartElement, kElementLength + attributes_length);
+  Put32(nodes_, kNone);  // namespace
+  Put32(nodes_, Ref(name));
+  Put16(nodes_, kElementLength);  // where the attributes start
+  Put16(nodes_, attribute_length);
+  Put16(nodes_, static_cast<uint16_t>(count));
+  Put16(nodes_, 0);  // id
+  Put16(nodes_, 0);  // class
+  Put16(nodes_, 0);  // style
 }
 
 void CompiledXml::PutAttribute(const XmlAttribute& attribute) {

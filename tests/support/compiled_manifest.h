@@ -8,7 +8,8 @@
 
 #include "support/der.h"
 
-// One attribute of an element. Names and texts are UTF-8 and may hold NUL.
+// One attribute of an element. Names and texts are UTF-8 and may hold NUL. Three bytes may stand
+// for an unpaired surrogate, as U+D800 is ED A0 80.
 struct XmlAttribute {
   std::string name;
   uint8_t type;            // of the typed value (Res_value)
@@ -41,6 +42,9 @@ class CompiledXml {
   CompiledXml& End(const std::string& name);
   // A start and an end tag.
   CompiledXml& Element(const std::string& name, const std::vector<XmlAttribute>& attributes = {});
+  // A start tag that claims `count` attributes of size 0: all of them lie where the one is.
+  CompiledXml& StartWithSizelessAttributes(const std::string& name, const XmlAttribute& attribute,
+                                           uint16_t count);
   CompiledXml& Text(const std::string& text);
   // A node with a header too short to be one: the document is bad from here on.
   CompiledXml& BadNode();
@@ -54,6 +58,8 @@ class CompiledXml {
  private:
   uint32_t Ref(const std::string& text);
   void PutNodeHeader(uint16_t type, size_t extra_length);
+  void PutStartTag(const std::string& name, size_t attributes_length, uint16_t attribute_length,
+                   size_t count);
   void PutAttribute(const XmlAttribute& attribute);
 
   Pool pool_;

@@ -3,9 +3,11 @@
 #include <sys/mman.h>
 #include <unistd.h>
 
+#include <cstdint>
 #include <cstdio>
 #include <cstdlib>
 #include <new>
+#include <utility>
 
 namespace {
 
@@ -33,14 +35,13 @@ bool IsAtEnd(const void* block) {
 
 }  // namespace
 
-std::vector<uint8_t> AtMemoryEnd(const uint8_t* data, size_t size) {
+void PutNextBlockAtMemoryEnd(size_t size) {
   if (size > kRoom) abort();
   if (memory_end == nullptr) MakeMemory();
   size_at_end = size;
-  std::vector<uint8_t> copy(data, data + size);
-  size_at_end = 0;
-  return copy;
 }
+
+bool WasPutAtMemoryEnd() { return std::exchange(size_at_end, 0) == 0; }
 
 void* operator new(size_t size) {
   if (size_at_end != 0 && size == size_at_end) {

@@ -5,9 +5,9 @@
 #pragma once
 
 #include <cstddef>
-#include <cstdint>
-#include <vector>
 
-// A copy of the `size` bytes at `data` (at most 1 MiB) with no memory behind it, but for what is
-// missing to a multiple of 4. One at a time; the vector must not grow.
-std::vector<uint8_t> AtMemoryEnd(const uint8_t* data, size_t size);
+// Has the next block of exactly `size` bytes (at most 1 MiB) that operator new is asked for end
+// where memory ends, but for what is missing to a multiple of 4. One block at a time.
+void PutNextBlockAtMemoryEnd(size_t size);
+// False, and not asked again, unless the block was put there.
+bool WasPutAtMemoryEnd();

@@ -59,6 +59,7 @@ Phone::~Phone() { phone = nullptr; }
 extern "C" {
 
 int __real_open(const char* path, int flags, ...);
+ssize_t __real_read(int fd, void* buffer, size_t size);
 FILE* __real_fopen(const char* path, const char* mode);
 int __real_fcntl(int fd, int command, ...);
 int __real_usleep(useconds_t microseconds);
@@ -67,12 +68,26 @@ ssize_t __real_readlink(const char* path, char* buffer, size_t size);
 
 // Nothing that is linked with a Phone makes files by open(), so there is no mode to pass on.
 int __wrap_open(const char* path, int flags, ...) {
-  if (phone != nullptr && phone->before_open) phone->before_open(path, flags);
-  if (phone == nullptr || phone->opens_before_failure < 0) return __real_open(path, flags);
-  if (phone->opens_before_failure-- > 0) return __real_open(path, flags);
-  phone->opens_before_failure = 0;
-  errno = ENOENT;
-  return -1;
+  if (phone == nullptr) return __real_open(path, flags);
+  if (phone->before_open) phone->before_open(path, flags);
+  if (const int error = phone->open_error ? phone->open_error(path, flags) : 0; error != 0) {
+    errno = error;
+    return -1;
+  }
+  const int fd = __real_open(path, flags);
+  if (fd >= 0 && phone->after_open) phone->after_open(path, fd);
+  return fd;
+}
+
+ssize_t __wrap_read(int fd, void* buffer, size_t size) {
+  if (phone != nullptr && phone->before_read) phone->before_read(fd);
+  const ssize_t count = __real_read(fd, buffer, size);
+  if (phone != nullptr && phone->after_read) phone->after_read(fd);
+  return count;
+}
+
+ssize_t __wrap___read_chk(int fd, void* buffer, size_t size, size_t /*room*/) {
+  return __wrap_read(fd, buffer, size);
 }
 
 // What open is called in a build with _FORTIFY_SOURCE, as every platform tree has.

@@ -1,9 +1,9 @@
 // What only the phone has, inside the test program: the kernel's integrity feature and libzu.
 //
-// A program that links this file and asks the linker to wrap open, fcntl, fopen, usleep, fgetxattr
-// and readlink, and the checked forms of open and readlink (target `phone` does), has a Phone to
-// set up and to read afterwards. Without a living Phone every wrapped call goes to the real system,
-// and libzu refuses.
+// A program that links this file and asks the linker to wrap open, read, fcntl, fopen, usleep,
+// fgetxattr and readlink, and the checked forms of open, read and readlink (target `phone` does),
+// has a Phone to set up and to read afterwards. Without a living Phone every wrapped call goes to
+// the real system, and libzu refuses.
 #pragma once
 
 #include <cstdint>
@@ -29,15 +29,19 @@ struct Phone {
   int zu_result = 0;              // what libzu answers
   int zu_attribute_size = -1;     // of "user.zu", on every file; -1: there is none
   std::vector<int> nameless_fds;  // descriptors whose path cannot be resolved
-  int opens_before_failure =
-      -1;  // open() succeeds so many times and then finds no file; -1: always
   // What fcntl answers to a request to sign or to verify that is in order.
   int kernel_result = 0;
 
   // Called before the integrity file is opened: after all checks, and before the kernel signs.
   std::function<void()> before_integrity;
-  // Called before each open().
+  // Called before each open(), and after each that succeeded.
   std::function<void(const char* path, int flags)> before_open;
+  std::function<void(const char* path, int fd)> after_open;
+  // The errno that an open() fails with; 0: the real system answers.
+  std::function<int(const char* path, int flags)> open_error;
+  // Called before and after each read().
+  std::function<void(int fd)> before_read;
+  std::function<void(int fd)> after_read;
 
   // Called after each event that has a descriptor, while that is still open.
   std::function<void(int fd, const std::string& event)> witness;

@@ -3,8 +3,10 @@
 #include <sys/mman.h>
 #include <sys/wait.h>
 
+#include <algorithm>
 #include <cerrno>
 #include <csignal>
+#include <functional>
 #include <map>
 
 #include "support/compiled_manifest.h"
@@ -116,6 +118,26 @@ TEST(Threat, DotsInAnEntryNameSignNoFileOutsideWithOtherBytes) {
   EXPECT_EQ(device.FilesSignedFor("rsa-2048"), Strings({"app/base.apk"}));
 }
 
+// The program's name ends in nothing that a library's does. What its bytes are is known, and
+// listed.
+void ExpectProgramSigned(const std::function<int(const char* program, const char* name)>& lead) {
+  Device device(MakePackage(WithLibrariesNamed({"lib/arm64-v8a/../../../mine/libx.so"})));
+  device.Install("lib/arm64/x", {}).Install("../mine/x", {}).Install("../system/program", kLibrary);
+  ASSERT_EQ(lead(device.Path("../system/program").c_str(), device.Path("../mine/libx.so").c_str()),
+            0);
+  const Strings files = device.FilesSignedFor("rsa-2048");
+  ASSERT_EQ(files.size(), 2u);
+  EXPECT_EQ(files[1], "app/base.apk");
+  struct stat program, signed_file;
+  ASSERT_EQ(stat(device.Path("../system/program").c_str(), &program), 0);
+  ASSERT_EQ(stat(device.Path("../" + files[0]).c_str(), &signed_file), 0);
+  EXPECT_EQ(program.st_ino, signed_file.st_ino);
+}
+
+TEST(Threat, ASymbolicLinkWhereDotsLeadHasAProgramSigned) { ExpectProgramSigned(symlink); }
+
+TEST(Threat, AHardLinkWhereDotsLeadHasAProgramSigned) { ExpectProgramSigned(link); }
+
 TEST(Threat, FileIsReadAndSignedForEachEntryThatNamesIt) {
   Device device(MakePackage(WithLibrariesNamed({"lib/arm64-v8a/a.so", "lib/arm64-v8a/./a.so"})));
   device.Install("lib/arm64/a.so", kLibrary);
@@ -146,6 +168,64 @@ TEST(Threat, PackageWhoseAndroidManifestCannotBeExtractedIsAJarThatTheKernelMust
   Device other(package);
   other.phone.verify_errno = ENOKEY;
   EXPECT_EQ(other.FilesSignedWith("0000"), Strings());
+}
+
+// ---- What a refused library, a damaged one, or one that stays in the package does not stop.
+
+TEST(Threat, PackageAndKeyAreTakenThoughEveryLibraryIsRefused) {
+  PackageOptions options;
+  options.secure_storage = true;
+  Device device(MakePackage(options));
+  device.Install("lib/arm64/libfoo.so", ToBytes("another's"));
+  EXPECT_EQ(device.FilesSignedFor("rsa-2048"), Strings({"app/base.apk"}));
+  EXPECT_EQ(Device(MakePackage(options)).Registered(),
+            Strings({"com.example.app " + Hex(ModulusOf("rsa-2048"))}));
+}
+
+// Nothing was extracted, and the bytes in the package are not looked at.
+TEST(Threat, LibrariesThatStayInThePackageAreNotCompared) {
+  Package package = MakePackage();
+  package.Item("lib/arm64-v8a/libfoo.so").data = ToBytes("another's");
+  EXPECT_EQ(Device(package).FilesSignedFor("rsa-2048"), Strings({"app/base.apk"}));
+}
+
+// The libraries in the order of the walk.
+Strings LibrariesWalked(const Package& package) {
+  const MemoryFile file(package.Build());
+  ApkTools::Apk apk(file.fd());
+  Strings names;
+  void* cookie = nullptr;
+  apk.StartIteration(&cookie, "lib/", ".so");
+  ZipEntry entry;
+  for (std::string name; apk.Next(cookie, &entry, name) == 0;) names.push_back(name);
+  apk.EndIteration(cookie);
+  return names;
+}
+
+// The library compares the entry's two headers when it comes to it, and ends the walk there.
+TEST(Threat, ADamagedLibraryEndsTheWalkAndIntactOnesBehindItStayUnsigned) {
+  const Strings names = {"lib/arm64-v8a/liba.so", "lib/arm64-v8a/libb.so", "lib/arm64-v8a/libc.so"};
+  const Package intact = MakePackage(WithLibrariesNamed(names));
+  const Strings walked = LibrariesWalked(intact);
+  ASSERT_EQ(walked.size(), 3u);
+  for (size_t damaged = 0; damaged < 3; ++damaged) {
+    Package package = intact;
+    package.Item(walked[damaged]).local.crc = 1;
+    Device device(package);
+    Strings expected;
+    for (size_t i = 0; i < 3; ++i) {
+      const std::string file = "lib/arm64" + walked[i].substr(walked[i].rfind('/'));
+      device.Install(file, kLibrary);
+      if (i < damaged) expected.push_back("app/" + file);
+    }
+    expected.push_back("app/base.apk");
+    EXPECT_EQ(device.FilesSignedFor("rsa-2048"), expected);
+    const Records& records = device.log.records();
+    EXPECT_EQ(std::count(records.begin(), records.end(), Info("VeltSignJni finished: 0.\n")), 1);
+    EXPECT_EQ(std::count_if(records.begin(), records.end(),
+                            [](const LogRecord& record) { return record.priority == 6; }),
+              0);
+  }
 }
 
 // ---- What is written to while it is worked on.

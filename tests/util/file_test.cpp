@@ -21,6 +21,7 @@
 #include <vector>
 
 #include "support/files.h"
+#include "support/lease.h"
 #include "support/log_capture.h"
 
 // What a test has the kernel answer; where nothing is set, the kernel answers itself.
@@ -101,6 +102,7 @@ class FileTest : public testing::Test {
   TempDir folder_;
 };
 using ReadFileTest = FileTest;
+using OpenForReadingTest = FileTest;
 using GetFilenameByFdTest = FileTest;
 
 // The number that the next descriptor gets.
@@ -345,6 +347,98 @@ class DeepDirectory {
   std::vector<std::string> names_;
   std::string path_;
 };
+
+// ---- Through a descriptor.
+
+TEST_F(ReadFileTest, DescriptorIsReadFromItsStartWhateverThePathLeadsTo) {
+  const int fd = open(MakeFile("abc").c_str(), O_RDONLY | O_CLOEXEC);
+  EXPECT_EQ(2, lseek(fd, 2, SEEK_SET));
+  ASSERT_EQ(0, unlink(Path("file").c_str()));
+  MakeFile("another");
+  Bytes out;
+  struct stat read, state;
+  EXPECT_TRUE(ReadFile(Path("file"), out, &read, fd));
+  EXPECT_EQ(ToBytes("abc"), out);
+  EXPECT_EQ(0, fstat(fd, &state));
+  EXPECT_TRUE(IsSameFile(state, read));
+  close(fd);
+}
+
+TEST_F(ReadFileTest, DescriptorOfADirectoryHasNoSizeAndStaysOpen) {
+  const int fd = open(folder_.path().c_str(), O_RDONLY | O_DIRECTORY | O_CLOEXEC);
+  LogCapture log;
+  Bytes out;
+  EXPECT_FALSE(ReadFile("its name", out, nullptr, fd));
+  EXPECT_EQ(Records({Error("Can't read file: its name (streamoff=-1)\n")}), log.records());
+  EXPECT_EQ(0, close(fd));
+}
+
+// ---- Its memory.
+
+// That the former memory is gone by then, tests/apk/memory_test.cpp tells.
+TEST_F(ReadFileTest, EmptyVectorGetsNoMoreMemoryThanTheFileNeeds) {
+  Bytes out(1000);
+  out.clear();
+  ASSERT_TRUE(ReadFile(MakeFile(std::string(1001, 'x')), out));
+  EXPECT_EQ(1001u, out.capacity());
+  EXPECT_EQ(Bytes(1001, 'x'), out);
+}
+
+TEST_F(ReadFileTest, EmptyVectorWithMemoryEnoughKeepsIt) {
+  Bytes out(1000);
+  const uint8_t* const memory = out.data();
+  out.clear();
+  ASSERT_TRUE(ReadFile(MakeFile(std::string(1000, 'x')), out));
+  EXPECT_EQ(memory, out.data());
+  EXPECT_EQ(Bytes(1000, 'x'), out);
+}
+
+// ---- Without waiting for a writer, and with waiting for whoever holds a lease.
+
+TEST_F(OpenForReadingTest, FifoNeverWouldBlockForReading) {
+  ASSERT_EQ(0, mkfifo(Path("fifo").c_str(), 0600));
+  for (const bool has_writer : {false, true}) {
+    const int writer = has_writer ? open(Path("fifo").c_str(), O_RDWR | O_CLOEXEC) : -1;
+    const int fd = OpenForReading(Path("fifo").c_str(), O_CLOEXEC);
+    EXPECT_GE(fd, 0) << strerror(errno);
+    close(fd);
+    if (has_writer) close(writer);
+  }
+}
+
+TEST_F(OpenForReadingTest, LeasedFileIsOpenedOnceItsHolderGivesItUp) {
+  const std::string path = MakeFile("abc");
+  const Lease lease(path);
+  if (!lease.IsHeld()) GTEST_SKIP() << "the file system of " << path << " knows no leases";
+  ASSERT_EQ(-1, open(path.c_str(), O_RDONLY | O_NONBLOCK | O_CLOEXEC));
+  ASSERT_EQ(EWOULDBLOCK, errno);
+  const int fd = OpenForReading(path.c_str(), O_CLOEXEC);
+  EXPECT_GE(fd, 0) << strerror(errno);
+  EXPECT_TRUE(lease.WasGivenUp());
+  EXPECT_EQ(path, GetFilenameByFd(fd));
+  EXPECT_EQ(O_RDONLY, fcntl(fd, F_GETFL) & (O_ACCMODE | O_NONBLOCK | O_PATH));
+  EXPECT_EQ(FD_CLOEXEC, fcntl(fd, F_GETFD));
+  close(fd);
+}
+
+TEST_F(ReadFileTest, LeasedFileIsReadOnceItsHolderGivesItUp) {
+  const int before = NextDescriptor();
+  const std::string path = MakeFile("abc");
+  {
+    const Lease lease(path);
+    if (!lease.IsHeld()) GTEST_SKIP() << "the file system of " << path << " knows no leases";
+    Bytes out;
+    EXPECT_TRUE(ReadFile(path, out));
+    EXPECT_EQ(ToBytes("abc"), out);
+    EXPECT_TRUE(lease.WasGivenUp());
+  }
+  EXPECT_EQ(before, NextDescriptor());
+}
+
+TEST_F(OpenForReadingTest, TellsWhyAFileIsNotOpened) {
+  EXPECT_EQ(-1, OpenForReading(Path("missing").c_str(), 0));
+  EXPECT_EQ(ENOENT, errno);
+}
 
 // ---- Which file it is.
 

@@ -1,0 +1,290 @@
+// A library that is touched, exchanged or written to while the tool works on it. The changes come
+// at exact moments: before an open, after it, before and after a read, before the kernel signs.
+#include <gtest/gtest.h>
+#include <sys/stat.h>
+
+#include <algorithm>
+#include <cstdio>
+#include <functional>
+
+#include "sign/package_on_phone.h"
+
+namespace {
+
+using Change = std::function<void()>;
+
+class ChangedLibrary : public testing::Test {
+ protected:
+  ChangedLibrary() {
+    file_.Install("lib/arm64/libfoo.so", kGood);
+    file_.Install("good", kGood);
+    file_.Install("evil", kEvil);
+    file_.phone.before_open = [this](const char* path, int) {
+      if (path == target_ && ++opens_ == 2) Make(before_second_open_);
+    };
+    file_.phone.after_open = [this](const char* path, int) {
+      if (path == target_ && opens_ == 2) Make(after_second_open_);
+    };
+    file_.phone.before_read = [this](int) { Make(before_digest_[++digests_]); };
+    file_.phone.after_read = [this](int) { Make(after_digest_[digests_]); };
+    file_.phone.before_integrity = [this] { Make(before_signing_); };
+    file_.phone.witness = [this](int fd, const std::string&) { signed_.push_back(ReadAll(fd)); };
+  }
+  void SetUp() override { alarm(60); }  // ends a test that waits for a FIFO
+  void TearDown() override { alarm(0); }
+
+  // The library is signed after so many digests, and nothing is said but that.
+  void ExpectSigned(int digests) {
+    EXPECT_EQ(file_.SignJni(), 0U);
+    EXPECT_EQ(signed_, std::vector<Bytes>({kGood.data}));
+    EXPECT_EQ(digests_, digests);
+    EXPECT_EQ(file_.log.records(),
+              Records({Starts(file_.fd()), Info("VeltSignOat: Apk case.\n"), Finished()}));
+  }
+  void ExpectRefused(int digests) {
+    const int next = dup(0);
+    close(next);
+    EXPECT_EQ(file_.SignJni(), 0U);
+    EXPECT_EQ(file_.phone.events, Events());
+    EXPECT_EQ(digests_, digests);
+    EXPECT_EQ(file_.log.records(),
+              Records({Starts(file_.fd()),
+                       Error("VeltSignJni: File not verified: " + target_ + "\n"), Finished()}));
+    EXPECT_EQ(dup(0), next) << "the library was left open";
+    close(next);
+  }
+
+  // Puts the file of this name in the library's place.
+  void Rename(const std::string& name) const {
+    EXPECT_EQ(rename(file_.Path(name).c_str(), target_.c_str()), 0);
+  }
+  // Has the library's place lead to the file of this name, whose state stays as it is.
+  void Link(const std::string& name) const {
+    unlink(target_.c_str());
+    EXPECT_EQ(symlink(file_.Path(name).c_str(), target_.c_str()), 0);
+  }
+  // Writes the other bytes, which are as many, into the file itself.
+  void WriteInPlace() const {
+    UntilNoticed([this] {
+      FILE* const file = fopen(target_.c_str(), "r+");
+      EXPECT_EQ(fwrite(kEvil.data.data(), 1, kEvil.data.size(), file), kEvil.data.size());
+      fclose(file);
+    });
+  }
+
+  // Changes the file until its state tells of it: the clock of a file system is coarse.
+  void UntilNoticed(const Change& change) const {
+    const struct stat before = State();
+    do {
+      change();
+    } while (State().st_ctim.tv_sec == before.st_ctim.tv_sec &&
+             State().st_ctim.tv_nsec == before.st_ctim.tv_nsec);
+  }
+  struct stat State() const {
+    struct stat state;
+    EXPECT_EQ(stat(target_.c_str(), &state), 0);
+    return state;
+  }
+
+  static void Make(const Change& change) {
+    if (change) change();
+  }
+  static Bytes ReadAll(int fd) {
+    Bytes bytes(100);
+    bytes.resize(static_cast<size_t>(std::max<ssize_t>(0, pread(fd, bytes.data(), 100, 0))));
+    return bytes;
+  }
+
+  const ZipItem kGood = Library("lib/arm64-v8a/libfoo.so");
+  const ZipItem kEvil = Library("LIB/arm64-v8a/libfoo.so");
+  PackageOnPhone file_{MakePackage(WithLibraries({kGood}))};
+  const std::string target_ = file_.Path("lib/arm64/libfoo.so");
+  Change before_second_open_, after_second_open_, before_signing_;
+  Change before_digest_[9], after_digest_[9];  // by the digest's number, from 1
+  int opens_ = 0;
+  int digests_ = 0;
+  std::vector<Bytes> signed_;  // the bytes behind each descriptor that was signed
+};
+
+TEST_F(ChangedLibrary, LeftAloneIsSignedAfterOneDigest) { ExpectSigned(1); }
+
+// --- Touched, and its bytes as they were. A test for each way of an installer's to finish its
+// work.
+
+class TouchedLibrary : public ChangedLibrary, public testing::WithParamInterface<const char*> {
+ protected:
+  void Touch() const {
+    UntilNoticed([this] {
+      const struct stat now = State();
+      const std::string way = GetParam(), other = file_.Path("other-name");
+      if (way == "chmod") {
+        EXPECT_EQ(chmod(target_.c_str(), now.st_mode & 07777), 0);
+      } else if (way == "chown") {
+        EXPECT_EQ(chown(target_.c_str(), now.st_uid, now.st_gid), 0);
+      } else if (way == "link") {
+        EXPECT_EQ(link(target_.c_str(), other.c_str()), 0);
+        EXPECT_EQ(unlink(other.c_str()), 0);
+      } else {
+        const timespec times[] = {now.st_atim, now.st_mtim};
+        EXPECT_EQ(utimensat(AT_FDCWD, target_.c_str(), times, 0), 0);
+      }
+    });
+  }
+};
+INSTANTIATE_TEST_SUITE_P(By, TouchedLibrary, testing::Values("chmod", "chown", "link", "utimensat"),
+                         [](const auto& info) { return std::string(info.param); });
+
+TEST_P(TouchedLibrary, OnceWhileItIsReadIsSignedAfterASecondDigest) {
+  before_digest_[1] = [this] { Touch(); };
+  ExpectSigned(2);
+}
+
+TEST_P(TouchedLibrary, OnceBeforeItsSecondOpeningIsSignedAfterASecondDigest) {
+  before_second_open_ = [this] { Touch(); };
+  ExpectSigned(2);
+}
+
+TEST_P(TouchedLibrary, TwiceIsSignedAfterAThirdDigest) {
+  before_digest_[1] = after_digest_[2] = [this] { Touch(); };
+  ExpectSigned(3);
+}
+
+TEST_P(TouchedLibrary, AgainAndAgainIsRefusedAfterThreeDigests) {
+  for (Change& change : before_digest_) change = [this] { Touch(); };
+  ExpectRefused(3);
+}
+
+TEST_P(TouchedLibrary, AfterEveryDigestIsRefusedAfterThree) {
+  for (Change& change : after_digest_) change = [this] { Touch(); };
+  ExpectRefused(3);
+}
+
+// --- Exchanged: by a rename, or behind a symbolic link.
+
+TEST_F(ChangedLibrary, ExchangedBeforeItsSecondOpeningForOtherBytesIsRefused) {
+  before_second_open_ = [this] { Rename("evil"); };
+  ExpectRefused(2);
+}
+
+TEST_F(ChangedLibrary, ExchangedBeforeItsSecondOpeningForTheSameBytesIsSigned) {
+  before_second_open_ = [this] { Rename("good"); };
+  ExpectSigned(2);
+}
+
+TEST_F(ChangedLibrary, ExchangedAfterItsSecondOpeningIsSignedAsItWasOpened) {
+  before_second_open_ = [this] { Rename("good"); };
+  after_second_open_ = [this] { Rename("evil"); };
+  ExpectSigned(2);
+}
+
+// The file lost its name, which changes its state.
+TEST_F(ChangedLibrary, ExchangedAfterItsLastByteIsSignedAsItWasRead) {
+  before_second_open_ = [this] { Rename("good"); };
+  after_digest_[2] = [this] { Rename("evil"); };
+  ExpectSigned(3);
+}
+
+TEST_F(ChangedLibrary, ExchangedBeforeTheKernelSignsIsSignedAsItWasRead) {
+  before_signing_ = [this] { Rename("evil"); };
+  ExpectSigned(1);
+}
+
+// The path leads to the file that was read, in the state that it had: the descriptor tells.
+TEST_F(ChangedLibrary, ExchangedForTheMomentOfItsOpeningIsRefused) {
+  Link("good");
+  before_second_open_ = [this] { Link("evil"); };
+  after_second_open_ = [this] { Link("good"); };
+  ExpectRefused(2);
+}
+
+TEST_F(ChangedLibrary, ExchangedForTheMomentOfItsFirstDigestIsRefused) {
+  Link("good");
+  before_second_open_ = [this] { Link("evil"); };
+  before_digest_[2] = [this] { Link("good"); };
+  ExpectRefused(2);
+}
+
+// --- No regular file any more: refused at once.
+
+TEST_F(ChangedLibrary, ExchangedForAFifoIsRefusedAtOnce) {
+  before_second_open_ = [this] {
+    EXPECT_EQ(mkfifo(file_.Path("fifo").c_str(), 0600), 0);
+    Rename("fifo");
+  };
+  ExpectRefused(1);
+}
+
+TEST_F(ChangedLibrary, ExchangedForADirectoryIsRefusedAtOnce) {
+  before_second_open_ = [this] { Link("lib"); };
+  ExpectRefused(1);
+}
+
+// --- Written to in place, and the times tell.
+
+TEST_F(ChangedLibrary, WrittenToBeforeItsSecondOpeningIsRefused) {
+  before_second_open_ = [this] { WriteInPlace(); };
+  ExpectRefused(2);
+}
+
+TEST_F(ChangedLibrary, WrittenToAfterItsSecondOpeningIsRefused) {
+  after_second_open_ = [this] { WriteInPlace(); };
+  ExpectRefused(2);
+}
+
+TEST_F(ChangedLibrary, WrittenToAfterItsSecondDigestIsRefused) {
+  before_second_open_ = [this] { Rename("good"); };
+  after_digest_[2] = [this] { WriteInPlace(); };
+  ExpectRefused(3);
+}
+
+TEST_F(ChangedLibrary, WrittenToAfterItsThirdDigestIsRefused) {
+  before_second_open_ = [this] { Rename("good"); };
+  after_digest_[2] = [this] {
+    UntilNoticed([this] { EXPECT_EQ(chmod(target_.c_str(), 0600), 0); });
+  };
+  after_digest_[3] = [this] { WriteInPlace(); };
+  ExpectRefused(3);
+}
+
+// --- Under a lease, which an open breaks: the tool waits for its holder.
+
+TEST_F(ChangedLibrary, ThatIsLeasedAtItsSecondOpeningIsSigned) {
+  int asked = 0;
+  file_.phone.open_error = [&](const char* path, int) {
+    return path == target_ && ++asked == 2 ? EWOULDBLOCK : 0;
+  };
+  ExpectSigned(1);
+  EXPECT_EQ(asked, 3);  // the third pins the file, which is then opened by way of its descriptor
+}
+
+// The holder has the time to put anything in the file's place.
+TEST_F(ChangedLibrary, ThatIsLeasedAndThenAFifoIsNotWaitedFor) {
+  int asked = 0;
+  file_.phone.open_error = [&](const char* path, int) {
+    if (path != target_ || ++asked != 2) return 0;
+    EXPECT_EQ(mkfifo(file_.Path("fifo").c_str(), 0600), 0);
+    Rename("fifo");
+    return EWOULDBLOCK;
+  };
+  EXPECT_EQ(file_.SignJni(), 0U);
+  EXPECT_EQ(file_.phone.events, Events());
+  EXPECT_EQ(file_.log.records(),
+            Records({Starts(file_.fd()), Error("File " + target_ + " is not opened"),
+                     Error("Error 11: Resource temporarily unavailable.\n"), Finished()}));
+}
+
+TEST_F(ChangedLibrary, ThatIsLeasedAndThenGoneIsNotOpened) {
+  int asked = 0;
+  file_.phone.open_error = [&](const char* path, int) {
+    if (path != target_ || ++asked != 2) return 0;
+    EXPECT_EQ(unlink(target_.c_str()), 0);
+    return EWOULDBLOCK;
+  };
+  EXPECT_EQ(file_.SignJni(), 0U);
+  EXPECT_EQ(file_.phone.events, Events());
+  EXPECT_EQ(file_.log.records(),
+            Records({Starts(file_.fd()), Error("File " + target_ + " is not opened"),
+                     Error("Error 2: No such file or directory.\n"), Finished()}));
+}
+
+}  // namespace

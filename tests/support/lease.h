@@ -1,0 +1,45 @@
+// A write lease on a file (fcntl, F_SETLEASE), whose holder gives it up some time after another
+// process, or this one, opens the file. Until then such an open waits, or fails with EWOULDBLOCK.
+#pragma once
+
+#include <fcntl.h>
+#include <unistd.h>
+
+#include <atomic>
+#include <csignal>
+#include <string>
+#include <thread>
+
+class Lease {
+ public:
+  explicit Lease(const std::string& path) : fd_(open(path.c_str(), O_RDWR | O_CLOEXEC)) {
+    signal(SIGIO, SIG_IGN);  // by which the kernel tells the holder
+    is_held_ = fcntl(fd_, F_SETLEASE, F_WRLCK) == 0;
+    if (is_held_) holder_ = std::thread([this] { GiveUpWhenAsked(); });
+  }
+  ~Lease() {
+    is_over_ = true;
+    if (holder_.joinable()) holder_.join();
+    close(fd_);
+  }
+  Lease(const Lease&) = delete;
+  Lease& operator=(const Lease&) = delete;
+
+  // False where the file system knows no leases.
+  bool IsHeld() const { return is_held_; }
+  bool WasGivenUp() const { return was_given_up_; }
+
+ private:
+  void GiveUpWhenAsked() {
+    while (!is_over_ && fcntl(fd_, F_GETLEASE) == F_WRLCK) usleep(1000);
+    usleep(100000);  // the holder has something to finish
+    was_given_up_ = !is_over_;
+    fcntl(fd_, F_SETLEASE, F_UNLCK);
+  }
+
+  const int fd_;
+  bool is_held_;
+  std::atomic<bool> is_over_{false};
+  std::atomic<bool> was_given_up_{false};
+  std::thread holder_;
+};
