@@ -15,7 +15,8 @@ constexpr int32_t kNoMoreEntries = -1;
 
 void SilenceTheLog() {
   static const bool done = [] {
-    __android_log_set_logger([](const __android_logger_data*, const char*) {});
+    // A logger's parameters are others in each generation of the log library.
+    __android_log_set_logger([](auto...) {});
     return true;
   }();
   static_cast<void>(done);
