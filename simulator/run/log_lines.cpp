@@ -2,6 +2,7 @@
 
 #include <algorithm>
 #include <cctype>
+#include <cstdint>
 #include <cstdlib>
 #include <regex>
 
@@ -11,13 +12,13 @@ namespace simulator {
 
 namespace {
 
-constexpr int kNothing = -1;
+constexpr size_t kNothing = SIZE_MAX;
 
 // As the tool's sources have the text; `captured` counts its conversions from 0.
 constexpr struct LogText {
   LogMeaning meaning;
   const char* format;
-  int captured;
+  size_t captured;
 } kLogTexts[] = {
     {LogMeaning::kLibrariesBegin, "VeltSignJni starts: %d.\n", kNothing},
     {LogMeaning::kFileBegins, "VeltSign starts: zip_fd = %d, fd = %d.\n", kNothing},
@@ -78,19 +79,20 @@ Pattern MakePattern(const LogText& row);
 LogLine ReadLogLine(const std::string& text) {
   LogLine line;
   line.whole = text.substr(0, text.size() - (!text.empty() && text.back() == '\n' ? 1 : 0));
-  // What is this long was cut, and known by its start alone.
+  // What is this long was cut, and is known by its start alone.
   const bool is_cut = text.size() + 1 >= kLogTextSize;
   for (const Pattern& pattern : Patterns()) {
-    if (text.compare(0, pattern.start.size(), pattern.start) != 0) continue;
+    const std::string& start = pattern.start;
+    if (text.compare(0, start.size(), start) != 0) continue;
     std::smatch match;
-    const bool is_whole = std::regex_match(text, match, pattern.whole);
-    if (!is_whole && (!is_cut || pattern.start.empty())) continue;
+    if (is_cut ? start.empty() : !std::regex_match(text, match, pattern.whole)) continue;
     line.meaning = pattern.row->meaning;
     if (pattern.row->captured == kNothing) break;
-    line.text = is_whole ? match.str(static_cast<size_t>(pattern.row->captured) + 1)
-                         : text.substr(pattern.start.size());
+    line.text = is_cut ? line.whole.substr(start.size()) : match.str(pattern.row->captured + 1);
     const int base = pattern.conversion == 'X' ? 16 : 10;
-    if (pattern.conversion != 's') line.number = strtoll(line.text.c_str(), nullptr, base);
+    if (!is_cut && pattern.conversion != 's') {
+      line.number = strtoll(line.text.c_str(), nullptr, base);
+    }
     break;
   }
   return line;
@@ -118,7 +120,7 @@ Pattern MakePattern(const LogText& row) {
   const std::string format = row.format;
   Pattern pattern = {&row, format.substr(0, format.find('%')), {}, 's'};
   std::string whole;
-  int count = 0;
+  size_t count = 0;
   for (size_t i = 0; i < format.size(); ++i) {
     if (format[i] != '%') {
       if (ispunct(static_cast<unsigned char>(format[i])) != 0) whole += '\\';

@@ -33,9 +33,8 @@ class Reader {
 
   RunRecord record_;
   Step step_ = Step::kOpening;
-  std::optional<Attempt> attempt_;       // begun, and not yet closed
-  std::vector<LogLine> pending_;         // errors that the next line tells the use of
-  std::optional<std::string> vanished_;  // the library that could not be opened
+  std::optional<Attempt> attempt_;  // begun, and not yet closed
+  std::vector<LogLine> pending_;    // errors that the next line tells the use of
 };
 
 }  // namespace
@@ -148,7 +147,7 @@ void Reader::ReadError(const LogLine& line) {
 }
 
 void Reader::ReadSign(const json& event) {
-  if (!attempt_) Begin();
+  if (!attempt_ || attempt_->outcome != Attempt::Outcome::kBegun) Begin();
   attempt_->path = TextOf(event, "path");
   attempt_->payload = TextOf(event, "payload");
   attempt_->error = NumberOf(event, "errno");
@@ -188,7 +187,7 @@ void Reader::AddLibrary(const std::string& path, Attempt::Outcome outcome) {
 void Reader::CloseAttempt() {
   const std::optional<Attempt> attempt = std::exchange(attempt_, std::nullopt);
   if (!attempt || attempt->outcome == Attempt::Outcome::kBegun) return;
-  if (IsOwn(attempt->path)) {
+  if (IsOwn(attempt->path) && !record_.own) {
     record_.own = attempt;
   } else {
     record_.libraries.push_back(*attempt);

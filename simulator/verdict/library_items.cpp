@@ -15,7 +15,7 @@ struct Library {
   const Attempt* attempt = nullptr;
 };
 
-std::vector<Library> MatchAttempts(const RunRecord& run, const PackageFacts& facts);
+std::vector<Library> MatchAttempts(const RunRecord& run, const std::vector<LibraryFacts>& present);
 Reason WhyNotSigned(const Library& library, const RunRecord& run, const PackageFacts& facts,
                     bool is_walked);
 Reason WhyNotVerified(const Library& library, const PackageFacts& facts);
@@ -25,10 +25,11 @@ Reason WhyNotThere(const LibraryFacts& library, const PackageFacts& facts);
 
 void AddLibraryItems(const RunRecord& run, const PackageFacts& facts, const JudgeOptions& options,
                      std::vector<Item>* items) {
-  // A JAR's entries are nobody's libraries.
-  if (items->front().kind != ItemKind::kPackage) return;
   const bool is_walked = run.own || !run.libraries.empty();
-  for (const Library& library : MatchAttempts(run, facts)) {
+  // A JAR's entries are nobody's libraries; what the tool took up is told of in any case.
+  const bool is_package = items->front().kind == ItemKind::kPackage;
+  for (const Library& library :
+       MatchAttempts(run, is_package ? facts.libraries : std::vector<LibraryFacts>())) {
     const LibraryFacts& found = library.facts;
     const std::string& name = found.place.empty() ? found.entry : found.place;
     const Reason reason = WhyNotSigned(library, run, facts, is_walked);
@@ -60,10 +61,10 @@ namespace {
 
 // The tool takes the libraries up in the order of the archive, which is known from the file. Where
 // that does not fit what it did, the paths that it named are all there is to go by.
-std::vector<Library> MatchAttempts(const RunRecord& run, const PackageFacts& facts) {
+std::vector<Library> MatchAttempts(const RunRecord& run, const std::vector<LibraryFacts>& present) {
   std::vector<Library> libraries;
   auto attempt = run.libraries.begin();
-  for (const LibraryFacts& library : facts.libraries) {
+  for (const LibraryFacts& library : present) {
     libraries.push_back({library, nullptr});
     const bool is_taken_up = library.is_met && !library.place.empty();
     if (is_taken_up && attempt != run.libraries.end()) libraries.back().attempt = &*attempt++;
