@@ -128,7 +128,7 @@ std::string WithoutEnd(std::string text) {
 
 void PrintLine(int number, const Line& line, const Look& look, std::ostream& out) {
   char head[64];
-  snprintf(head, sizeof(head), "%4d  %-9s  ", number, line.what.c_str());
+  snprintf(head, sizeof(head), "%4d  %-9s  ", number, Printable(line.what, look).c_str());
   const Colour colour = line.is_failure ? Colour::kRed : Colour::kPlain;
   out << Coloured(head + Printable(line.text, look), colour, look) << '\n';
   if (line.detail.empty()) return;
