@@ -48,48 +48,47 @@ Report WholeReport() {
   report.protection.vouched = {3, 4};
   report.protection.unlisted = {5, 6};
   report.protection.signature = {7, 8};
-  report.chain = {{"key", LinkState::kHolds, "RSA-2048"}, {"entries", LinkState::kBroken, "x"}};
-
+  report.chain = {{"key", LinkState::kHolds, "RSA-2048"},
+                  {"entries", LinkState::kBroken, "x"},
+                  {"manifest", LinkState::kNotReached, "y"}};
   return report;
 }
 
 }  // namespace
 
+// Compared as a whole, so that no member is added, lost or taken from another one unnoticed.
 TEST(VerdictEvent, HoldsTheWholeReport) {
   const Json event = ParseJournal(VerdictEvent(WholeReport())).at(0);
-  EXPECT_EQ(event["event"], "verdict");
-  EXPECT_EQ(event["file"], "base.apk");
-  EXPECT_EQ(event["path"], "/data/app/od\uf7e9\".apk");
-  EXPECT_EQ(event["verdict"], "partly-signed");
-  EXPECT_EQ(event["status"], 1);
-  EXPECT_EQ(event["package"], "com.app");
-  EXPECT_EQ(event["payload"], "2000ab");
-  EXPECT_EQ(event["items"], Json::parse(R"json([
-    {"kind": "package", "name": "package", "state": "signed"},
-    {"kind": "library", "name": "lib/arm64/a.so", "entry": "lib/arm64-v8a/a.so",
-     "state": "refused", "reason": "kernel-refused", "text": "the kernel refused (EPERM)"},
-    {"kind": "library", "name": "lib/arm/a.so", "entry": "lib/armeabi/a.so", "state": "absent",
-     "reason": "library-missing",
-     "text": "it does not lie beside the package, where others are"},
-    {"kind": "library", "name": "lib/x86/a.so", "entry": "lib/x86/a.so",
-     "state": "nothing-to-sign", "reason": "library-other-abi",
-     "text": "no phone of this kind installs it"},
-    {"kind": "key", "name": "com.app", "state": "registered"}])json"));
-  EXPECT_EQ(event["warnings"], Json::parse(R"([{"reason": "signing-block-damaged",
-    "text": "the block of the schemes after v1 does not read"}])"));
-  EXPECT_EQ(event["signers"], Json::parse(R"([
-    {"scheme": "v1", "subject": "CN=a", "certificate_sha256": "11", "key_algorithm": "RSA",
-     "key_bits": 2048, "key_sha256": "22", "modulus_sha256": "ab"},
-    {"scheme": "v2", "subject": "CN=a", "certificate_sha256": "11", "key_algorithm": "EC",
-     "key_bits": 256, "key_sha256": "44"},
-    {"scheme": "v3", "subject": "CN=a", "certificate_sha256": "11", "key_algorithm": "RSA",
-     "key_bits": 2048, "key_sha256": "22", "modulus_sha256": "33"}])"));
-  EXPECT_EQ(event["protection"], Json::parse(R"({
-    "verified": {"entries": 1, "bytes": 2}, "vouched": {"entries": 3, "bytes": 4},
-    "unlisted": {"entries": 5, "bytes": 6}, "signature": {"entries": 7, "bytes": 8}})"));
-  EXPECT_EQ(event["chain"], Json::parse(R"([
-    {"link": "key", "state": "holds", "text": "RSA-2048"},
-    {"link": "entries", "state": "broken", "text": "x"}])"));
+  EXPECT_EQ(event, Json::parse(R"json({
+    "event": "verdict", "file": "base.apk", "path": "/data/app/od\uf7e9\".apk",
+    "verdict": "partly-signed", "status": 1, "package": "com.app", "payload": "2000ab",
+    "items": [
+      {"kind": "package", "name": "package", "state": "signed"},
+      {"kind": "library", "name": "lib/arm64/a.so", "entry": "lib/arm64-v8a/a.so",
+       "state": "refused", "reason": "kernel-refused", "text": "the kernel refused (EPERM)"},
+      {"kind": "library", "name": "lib/arm/a.so", "entry": "lib/armeabi/a.so", "state": "absent",
+       "reason": "library-missing",
+       "text": "it does not lie beside the package, where others are"},
+      {"kind": "library", "name": "lib/x86/a.so", "entry": "lib/x86/a.so",
+       "state": "nothing-to-sign", "reason": "library-other-abi",
+       "text": "no phone of this kind installs it"},
+      {"kind": "key", "name": "com.app", "state": "registered"}],
+    "warnings": [{"reason": "signing-block-damaged",
+                  "text": "the block of the schemes after v1 does not read"}],
+    "signers": [
+      {"scheme": "v1", "subject": "CN=a", "certificate_sha256": "11", "key_algorithm": "RSA",
+       "key_bits": 2048, "key_sha256": "22", "modulus_sha256": "ab"},
+      {"scheme": "v2", "subject": "CN=a", "certificate_sha256": "11", "key_algorithm": "EC",
+       "key_bits": 256, "key_sha256": "44"},
+      {"scheme": "v3", "subject": "CN=a", "certificate_sha256": "11", "key_algorithm": "RSA",
+       "key_bits": 2048, "key_sha256": "22", "modulus_sha256": "33"}],
+    "protection": {
+      "verified": {"entries": 1, "bytes": 2}, "vouched": {"entries": 3, "bytes": 4},
+      "unlisted": {"entries": 5, "bytes": 6}, "signature": {"entries": 7, "bytes": 8}},
+    "chain": [
+      {"link": "key", "state": "holds", "text": "RSA-2048"},
+      {"link": "entries", "state": "broken", "text": "x"},
+      {"link": "manifest", "state": "not-reached", "text": "y"}]})json"));
 }
 
 TEST(VerdictEvent, IsOneLine) {
