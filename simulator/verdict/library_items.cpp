@@ -86,7 +86,6 @@ std::vector<Library> MatchAttempts(const RunRecord& run, const std::vector<Libra
 Reason WhyNotSigned(const Library& library, const RunRecord& run, const PackageFacts& facts,
                     bool is_walked) {
   const LibraryFacts& found = library.facts;
-  if (found.place.empty()) return {&cause::kLibraryOtherAbi, ""};
   const auto& lost = run.not_extracted;
   if (std::find(lost.begin(), lost.end(), found.entry) != lost.end()) {
     return {&cause::kLibraryNotExtracted, ""};
@@ -99,6 +98,7 @@ Reason WhyNotSigned(const Library& library, const RunRecord& run, const PackageF
     }
     return WhyKernelDidNotSign(attempt);
   }
+  if (found.place.empty()) return {&cause::kLibraryOtherAbi, ""};
   if (!is_walked) return {&cause::kPackageRefused, ""};
   if (found.is_met) return {&cause::kNotReached, ""};
   if (found.error != 0) return WhyNotThere(found, facts);

@@ -300,6 +300,20 @@ TEST(MakeReport, IntegrityValuesAreReadAsTheToolReadsThem) {
   EXPECT_EQ(reason(nullptr), "package refused integrity-missing");
 }
 
+// Of one file as well, and of a library whose path nobody told.
+TEST(MakeReport, EachAnswerOfTheKernelCounts) {
+  const std::string refused = "kernel-refused EPERM: Operation not permitted";
+  EXPECT_EQ(Items({kFileStart, kTakesUp, Sign(kFile, kPackagePayload, EPERM),
+                   Sign(kFile, kPackagePayload)}),
+            Lines({"package refused " + refused, "base.apk done"}));
+  EXPECT_EQ(Items({kFileStart, kTakesUp, Sign(kFile, kPackagePayload),
+                   Sign(kFile, kPackagePayload, EPERM)}),
+            Lines({"package done", "base.apk refused " + refused}));
+  EXPECT_EQ(Items({kLibrariesStart, kTakesUp, Sign("", kPackagePayload, EPERM), CannotSign(EPERM),
+                   kFileStart, kTakesUp, Sign(kFile, kPackagePayload)}),
+            Lines({"package done", " refused " + refused}));
+}
+
 TEST(MakeReport, KernelRefusalsNameTheError) {
   EXPECT_EQ(Items({kLibrariesStart, kTakesUp, Integrity("1f"),
                    Sign(kLibrary, kPackagePayload, EPERM), CannotSign(1), kFileStart, kTakesUp,
