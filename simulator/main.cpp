@@ -20,8 +20,7 @@ int main(int argc, char** argv) {
   inputs.insert(inputs.end(), options.run.trust.begin(), options.run.trust.end());
   inputs.push_back(options.run.tool);
   if (const auto objection = presenter.Objection(inputs)) return Complain(kUsageError, *objection);
-  std::string error;
-  if (!simulator.Prepare(&error)) return Complain(kCannotSimulate, error);
+  if (const auto problem = simulator.Prepare()) return Complain(kCannotSimulate, *problem);
   if (!presenter.Begin()) return kCannotSimulate;
   CatchInterruptions();
   std::vector<std::optional<FileRun>> runs(files.size());

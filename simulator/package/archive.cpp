@@ -14,12 +14,11 @@ namespace {
 constexpr int32_t kNoMoreEntries = -1;
 
 void SilenceTheLog() {
-  static const bool done = [] {
+  [[maybe_unused]] static const bool done = [] {
     // A logger's parameters are others in each generation of the log library.
     __android_log_set_logger([](auto...) {});
     return true;
   }();
-  static_cast<void>(done);
 }
 
 // A name that no archive can hold is not there either.

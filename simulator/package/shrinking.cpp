@@ -32,13 +32,12 @@ void FillPage(int signal, siginfo_t* info, void*) {
 }  // namespace
 
 ShrinkGuard::ShrinkGuard() {
-  static const bool done = [] {
+  [[maybe_unused]] static const bool done = [] {
     struct sigaction action = {};
     action.sa_sigaction = FillPage;
     action.sa_flags = SA_SIGINFO;
     return sigaction(SIGBUS, &action, nullptr) == 0;
   }();
-  static_cast<void>(done);
   has_shrunk = 0;
   is_guarded = 1;
 }

@@ -23,11 +23,6 @@ namespace {
 
 namespace fs = std::filesystem;
 
-bool Tell(const std::string& message, std::string* error) {
-  *error = message;
-  return false;
-}
-
 // Why the last system call failed, as the end of a message.
 std::string ErrnoText() { return std::string(": ") + strerrordesc_np(errno); }
 
@@ -70,14 +65,12 @@ Simulator::Simulator(const RunOptions& options, bool has_standard_input)
       kernel_(ProgramDirectory() + "/../lib/apktoolkit/libapktoolkit_kernel.so"),
       signed_(options.state, options.jobs == 1) {}
 
-bool Simulator::Prepare(std::string* error) {
+std::optional<std::string> Simulator::Prepare() {
   kernel_descriptor_.emplace(open(kernel_.c_str(), O_RDONLY | O_CLOEXEC));
-  if (kernel_descriptor_->get() < 0)
-    return Tell("there is no stand-in " + kernel_ + ErrnoText(), error);
-  if (access(options_.tool.c_str(), X_OK) != 0) {
-    return Tell("cannot run " + options_.tool + ErrnoText(), error);
-  }
-  return signed_.Load() || Tell("cannot use the directory " + options_.state, error);
+  if (kernel_descriptor_->get() < 0) return "there is no stand-in " + kernel_ + ErrnoText();
+  if (access(options_.tool.c_str(), X_OK) != 0) return "cannot run " + options_.tool + ErrnoText();
+  if (!signed_.Load()) return "cannot use the directory " + options_.state;
+  return {};
 }
 
 FileRun Simulator::Run(const std::string& file) {

@@ -38,9 +38,9 @@ class Simulator {
  public:
   Simulator(const RunOptions& options, bool has_standard_input);
 
-  // Opens the state and looks for the stand-ins and the tool. False, with `error` set to what to
-  // tell the user, when the simulation cannot begin.
-  bool Prepare(std::string* error);
+  // Opens the state and looks for the stand-ins and the tool. None when the simulation can begin,
+  // else why it cannot.
+  std::optional<std::string> Prepare();
 
   // Runs the tool for `file`. May be called from several threads when the options have several
   // jobs.
