@@ -26,6 +26,12 @@ _apktoolkit_sim() {
     --install)
       mapfile -t COMPREPLY < <(compgen -W "phone all arm64 arm" -- "$word")
       ;;
+    --installer)
+      mapfile -t COMPREPLY < <(compgen -W "auto required off" -- "$word")
+      ;;
+    --api)
+      mapfile -t COMPREPLY < <(compgen -W "27- 27-29 30-" -- "$word")
+      ;;
     --state)
       compopt -o filenames
       mapfile -t COMPREPLY < <(compgen -d -- "$word")
@@ -38,7 +44,7 @@ _apktoolkit_sim() {
     *)
       if [[ $word == -* ]]; then
         mapfile -t COMPREPLY < <(
-          compgen -W "--help --html --install --integrity --jobs --journal --json --quiet
+          compgen -W "--api --help --html --install --installer --integrity --jobs --journal --json --quiet
             --runner --sign-errno --state --strict --timeout --tool --trust --verbose
             --verify-errno --version --zu-result" -- "$word"
         )

@@ -1,6 +1,8 @@
 // apktoolkit-sim: the phone that apktoolkit runs in, on a workstation.
+#include <future>
 #include <utility>
 
+#include "simulator/installer/installer.h"
 #include "simulator/options.h"
 #include "simulator/run/process.h"
 #include "simulator/run/queue.h"
@@ -15,20 +17,32 @@ int main(int argc, char** argv) {
   if (const auto status = ParseOptions(argc, argv, &options)) return EndWith(*status);
   const std::vector<std::string>& files = options.files;
   Simulator simulator(options.run, has_standard_input);
+  Installer installer(options.installer);
   Presenter presenter(options.show, files.size());
   std::vector<std::string> inputs = files;
   inputs.insert(inputs.end(), options.run.trust.begin(), options.run.trust.end());
   inputs.push_back(options.run.tool);
   if (const auto objection = presenter.Objection(inputs)) return Complain(kUsageError, *objection);
   if (const auto problem = simulator.Prepare()) return Complain(kCannotSimulate, *problem);
+  if (options.installer.use == InstallerUse::kRequired) {
+    if (const auto missing = installer.Missing()) return Complain(kCannotSimulate, *missing);
+  }
   if (!presenter.Begin()) return kCannotSimulate;
   CatchInterruptions();
   std::vector<std::optional<FileRun>> runs(files.size());
+  std::vector<Judgement> judgements(files.size());
   RunInOrder(
-      files.size(), options.run.jobs, [&](size_t i) { runs[i] = simulator.Run(files[i]); },
+      files.size(), options.run.jobs,
+      [&](size_t i) {
+        // The two do not know of each other, and so they work at the same time.
+        auto judged = std::async(std::launch::async, [&] { return installer.Judge(files[i]); });
+        runs[i] = simulator.Run(files[i]);
+        judgements[i] = judged.get();
+      },
       [&](size_t i) {
         const FileRun run = *std::exchange(runs[i], std::nullopt);
-        presenter.Show(MakeReport(run.record, run.facts, options.judge), run.journal);
+        const Judgement judgement = std::exchange(judgements[i], {});
+        presenter.Show(MakeReport(run.record, run.facts, options.judge, judgement), run.journal);
       },
       [&](size_t i, int seconds) { presenter.ShowProgress(files[i], seconds); });
   const int status = presenter.Finish();

@@ -20,11 +20,18 @@ constexpr char kDescription[] =
 constexpr char kFooter[] =
     "Exit status, the highest of all FILEs:\n"
     "  0  all was signed that was to be signed\n"
-    "  1  something was refused\n"
+    "  1  something was refused, by the tool or by a phone's installer\n"
     "  2  the command line is wrong\n"
     "  3  the simulation could not run, or did not end in time\n"
     "  4  the tool could not look at a FILE: missing, no permission, read-only\n"
     "More, with examples: man apktoolkit-sim";
+
+constexpr struct {
+  const char* name;
+  InstallerUse use;
+} kInstallerUses[] = {{"auto", InstallerUse::kAuto},
+                      {"required", InstallerUse::kRequired},
+                      {"off", InstallerUse::kOff}};
 
 constexpr char kInstall[] = "--install";
 constexpr struct {
@@ -39,8 +46,10 @@ std::vector<std::string> WordsOf(int argc, char** argv);
 void AddPhone(CLI::App* app, Options* options);
 void AddKernelAnswer(CLI::App* app, const char* name, int* error, const char* description);
 void AddInstallation(CLI::App* app, Options* options);
+void AddInstaller(CLI::App* app, Options* options);
 void AddOutput(CLI::App* app, Options* options);
 void AddRun(CLI::App* app, Options* options, std::string* runner);
+bool ReadLevels(const std::string& text, LevelRange* levels);
 int ErrorNumber(const std::string& name);
 std::optional<int> NameUnknownOption(const CLI::App& app);
 
@@ -52,6 +61,7 @@ std::optional<int> ParseOptions(int argc, char** argv, Options* options) {
   app.get_formatter()->column_width(28);
   app.allow_extras();  // so that they can be named
   options->run.tool = ProgramDirectory() + "/apktoolkit";
+  options->installer.program = ProgramDirectory() + "/../lib/apktoolkit/installer.jar";
   std::string runner;
 
   app.add_option("FILE", options->files, "Packages, JARs or other files")
@@ -61,6 +71,7 @@ std::optional<int> ParseOptions(int argc, char** argv, Options* options) {
   AddPhone(&app, options);
   app.option_defaults()->group("The run");
   AddInstallation(&app, options);
+  AddInstaller(&app, options);
   AddOutput(&app, options);
   AddRun(&app, options, &runner);
   app.set_help_flag("-h,--help", "Print this help");
@@ -74,6 +85,7 @@ std::optional<int> ParseOptions(int argc, char** argv, Options* options) {
   } catch (const CLI::ParseError& error) {
     return app.exit(error) == 0 ? 0 : kUsageError;
   }
+  options->installer.timeout = options->run.timeout;
   for (const std::string& word : Split(runner, ' ')) {
     if (!word.empty()) options->run.runner.push_back(word);
   }
@@ -149,6 +161,38 @@ void AddInstallation(CLI::App* app, Options* options) {
                 "counts as refused");
 }
 
+void AddInstaller(CLI::App* app, Options* options) {
+  InstallerOptions* const installer = &options->installer;
+  const auto use = [installer](const std::string& name) {
+    for (const auto& each : kInstallerUses) {
+      if (name == each.name) installer->use = each.use;
+    }
+  };
+  const auto is_use = [](const std::string& name) {
+    const bool is_known = std::any_of(std::begin(kInstallerUses), std::end(kInstallerUses),
+                                      [&name](const auto& each) { return name == each.name; });
+    return is_known ? std::string() : "there are auto, required and off, and no " + name;
+  };
+  app->add_option_function<std::string>("--installer", use,
+                                        "Ask also what a phone's installer says, by\n"
+                                        "apksig: auto (where it is there), required or\n"
+                                        "off [default: auto]")
+      ->type_name("WHEN")
+      ->check(is_use)
+      ->take_last();
+  const auto set = [installer](const std::string& text) { ReadLevels(text, &installer->levels); };
+  const auto is_range = [](const std::string& text) {
+    LevelRange levels = {0, 0};
+    return ReadLevels(text, &levels) ? std::string()
+                                     : text + " is no API level and no range such as 27-33";
+  };
+  app->add_option_function<std::string>("--api", set,
+                                        "Whether phones of these API levels install it\n"
+                                        "[default: 27 and later]")
+      ->type_name("LEVEL[-LEVEL]")
+      ->check(is_range);
+}
+
 void AddOutput(CLI::App* app, Options* options) {
   const auto print = [app, options](const char* name, Detail detail, const char* description) {
     const auto set = [name, options, detail](int64_t) {
@@ -204,6 +248,22 @@ std::optional<int> NameUnknownOption(const CLI::App& app) {
   std::cerr << "there is no option " << word << " (a file of that name: ./" << word
             << ")\nRun with --help for more information.\n";
   return kUsageError;
+}
+
+// LEVEL, LEVEL-LEVEL or LEVEL-, of which the last has no end.
+bool ReadLevels(const std::string& text, LevelRange* levels) {
+  constexpr size_t kMostDigits = 5;
+  const std::vector<std::string> parts = Split(text, '-');
+  const auto is_number = [](const std::string& part) {
+    return !part.empty() && part.size() <= kMostDigits &&
+           part.find_first_not_of("0123456789") == std::string::npos;
+  };
+  if (parts.size() > 2 || !is_number(parts[0])) return false;
+  const bool has_end = parts.size() == 1 || !parts[1].empty();
+  if (has_end && !is_number(parts.back())) return false;
+  levels->first = std::stoi(parts[0]);
+  levels->last = has_end ? std::stoi(parts.back()) : kNewestLevel;
+  return levels->first >= 1 && levels->first <= levels->last;
 }
 
 // 0 when there is no error of this name.

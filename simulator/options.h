@@ -5,6 +5,7 @@
 #include <string>
 #include <vector>
 
+#include "simulator/installer/installer.h"
 #include "simulator/run/simulator.h"
 #include "simulator/show/presenter.h"
 #include "simulator/verdict/make_report.h"
@@ -13,6 +14,7 @@ namespace simulator {
 
 struct Options {
   RunOptions run;
+  InstallerOptions installer;
   JudgeOptions judge;
   ShowOptions show;
   std::vector<std::string> files;  // what the tool is run for; at least one

@@ -54,8 +54,9 @@ void Presenter::Show(const Report& report, const std::string& journal) {
   if (page_file_.IsWanted()) page_.Add(report);
   std::cout.flush();
   verdicts_.push_back(report.verdict);
+  if (report.installer.state == Judgement::State::kMissing) missing_ = report.installer.why;
   if (report.verdict == Verdict::kNotSimulated) {
-    Complain(kCannotSimulate, report.file + ": " + report.items[0].reason.Text());
+    Complain(kCannotSimulate, report.file + ": " + DecisiveItem(report)->reason.Text());
   }
   status_ = std::max<int>(status_, StatusOf(report.verdict));
 }
@@ -79,6 +80,7 @@ int Presenter::Finish() {
     std::cout << '\n' << Summary(verdicts_) << '\n';
   }
   if (page_file_.IsWanted() && !page_file_.Append(page_.Html())) FailToWrite(page_file_);
+  if (!missing_.empty()) Complain(status_, "no phone's installer was asked: " + missing_);
   return EndWith(status_);
 }
 

@@ -49,6 +49,7 @@ class Presenter {
   Page page_;
   std::vector<Verdict> verdicts_;
   bool is_progress_shown_ = false;
+  std::string missing_;  // why the installer was not asked; empty: it was, or nobody wanted it
   int status_ = kAllSigned;
 };
 

@@ -108,6 +108,8 @@ void Printer::PrintSigner() {
   Print("  signer");
   PrintRows(SignerRows(report_));
   Print("    schemes: " + Joined(report_.schemes));
+  const std::string takers = TakersText(report_.installer);
+  if (!takers.empty()) Print("    installer: " + takers);
   const Protection& all = report_.protection;
   Print("    protects: " + ShareText(all.verified, kVerifiedWord) + ", " +
         ShareText(all.vouched, kVouchedWord) + ", " + ShareText(all.unlisted, kUnlistedWord));

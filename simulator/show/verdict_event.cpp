@@ -40,7 +40,8 @@ Members ReasonMembers(const Reason& reason) {
 }
 
 std::string ItemJson(const Item& item) {
-  constexpr const char* kKinds[] = {"package", "jar", "file", "entries", "library", "key", "tool"};
+  constexpr const char* kKinds[] = {"package", "jar", "file", "entries",
+                                    "library", "key", "tool", "installer"};
   Members members = {{"kind", EncodeText(kKinds[static_cast<size_t>(item.kind)])},
                      {"name", EncodeText(item.name)}};
   if (item.kind == ItemKind::kLibrary) members.emplace_back("entry", EncodeText(item.entry));
@@ -96,6 +97,37 @@ std::string LinkJson(const Link& link) {
                  {"text", EncodeText(link.text)}});
 }
 
+std::string IssueJson(const InstallerIssue& issue) {
+  return Object({{"issue", EncodeText(issue.name)},
+                 {"parameters",
+                  List(issue.parameters, [](const std::string& text) { return EncodeText(text); })},
+                 {"text", EncodeText(issue.text)}});
+}
+
+std::string RangeJson(const RangeJudgement& range) {
+  Members members = {{"first", std::to_string(range.levels.first)}};
+  if (range.levels.last != kNewestLevel) {
+    members.emplace_back("last", std::to_string(range.levels.last));
+  }
+  members.insert(members.end(), {{"installs", range.is_verified ? "true" : "false"},
+                                 {"signers", List(range.signers,
+                                                  [](const InstallerSigner& signer) {
+                                                    const CertificateFacts& shown =
+                                                        signer.certificate;
+                                                    return SignerJson(signer.scheme, shown,
+                                                                      shown.key.modulus_sha256);
+                                                  })},
+                                 {"errors", List(range.errors, IssueJson)},
+                                 {"warnings", List(range.warnings, IssueJson)}});
+  return Object(members);
+}
+
+std::string InstallerJson(const Judgement& judgement) {
+  constexpr const char* kStates[] = {"not-asked", "missing", "gave-up", "judged"};
+  return Object({{"state", EncodeText(kStates[static_cast<size_t>(judgement.state)])},
+                 {"levels", List(judgement.ranges, RangeJson)}});
+}
+
 }  // namespace
 
 std::string VerdictEvent(const Report& report) {
@@ -108,6 +140,7 @@ std::string VerdictEvent(const Report& report) {
                return Object(ReasonMembers(warning));
              }));
   event.Json("signers", SignersJson(report));
+  event.Json("installer", InstallerJson(report.installer));
   event.Json("protection", ProtectionJson(report.protection));
   event.Json("chain", List(report.chain, LinkJson));
   return event.Line();

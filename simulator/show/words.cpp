@@ -9,8 +9,11 @@ namespace {
 // In the order of the verdicts.
 constexpr VerdictWords kVerdicts[] = {
     {"signed", "SIGNED", "signed", "signed", Mood::kGood},
+    {"other-signer", "SIGNED, OTHER SIGNER", "signed for another signer",
+     "signed for another signer", Mood::kMixed},
     {"trusted-jar", "TRUSTED JAR", "trusted JAR", "trusted JARs", Mood::kGood},
     {"partly-signed", "PARTLY SIGNED", "partly signed", "partly signed", Mood::kMixed},
+    {"not-installable", "NOT INSTALLABLE", "not installable", "not installable", Mood::kBad},
     {"refused", "REFUSED", "refused", "refused", Mood::kBad},
     {"not-trusted-jar", "NOT TRUSTED JAR", "JAR not trusted", "JARs not trusted", Mood::kBad},
     {"not-looked-at", "NOT LOOKED AT", "not looked at", "not looked at", Mood::kBad},
@@ -72,7 +75,10 @@ std::string OutcomeOf(const Item& item, Verdict verdict) {
     return "signed";
   }
   if (item.state != ItemState::kRefused) return "nothing to sign: " + reason;
-  if (item.kind == ItemKind::kTool || item.kind == ItemKind::kEntries) return reason;
+  if (item.kind == ItemKind::kTool || item.kind == ItemKind::kEntries ||
+      item.kind == ItemKind::kInstaller) {
+    return reason;
+  }
   if (item.kind == ItemKind::kKey) return "not registered: " + reason;
   return (verdict == Verdict::kNotLookedAt ? "not looked at: " : "not signed: ") + reason;
 }

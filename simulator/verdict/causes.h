@@ -16,7 +16,8 @@ enum class Group {
   kLibrary,
   kKey,
   kTool,
-  kWarning,  // all may be signed, and yet
+  kInstaller,  // a phone's installer would not take the package
+  kWarning,    // all may be signed, and yet
 };
 
 // What a cause means for the thing that it is said of.
@@ -322,6 +323,20 @@ inline constexpr Cause kToolFailed = {"tool-failed", Group::kTool, Severity::kRe
     "Check --tool: apktoolkit ends with 0 for every file."};
 inline constexpr Cause kToolError = {"tool-error", Group::kTool, Severity::kRefused,
     ChainLink::kEntries, "", "it logged an error: %s", "docs/messages.md has every message."};
+
+// ---- The installer of the phones.
+inline constexpr Cause kNotInstallable = {"not-installable", Group::kInstaller, Severity::kRefused,
+    ChainLink::kNone, "", "phones do not install it: %s",
+    "Sign the package again, as the last step that changes it. If it is not of your making: do not "
+    "trust it. apksigner verify --min-sdk-version 27 names every fault."};
+inline constexpr Cause kNotInstallableOnSome = {"not-installable-on-some", Group::kInstaller,
+    Severity::kRefused, ChainLink::kNone, "", "phones of %s",
+    "Sign it so that all of these phones take it, as apksigner does by itself. If it is for some "
+    "of them alone: --api names those."};
+inline constexpr Cause kInstallerGaveUp = {"installer-gave-up", Group::kInstaller,
+    Severity::kRefused, ChainLink::kNone, "", "the installer's verifier gave up: %s", "Do not "
+    "trust this package, if it is not of your making. A large one may need a larger --timeout; "
+    "--installer=off judges without the installer."};
 
 // ---- Warnings: all may be signed, and yet.
 inline constexpr Cause kOtherKey = {"other-key", Group::kWarning, Severity::kWarning,

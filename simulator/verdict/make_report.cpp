@@ -19,16 +19,19 @@ Reason WhyFailed(const Failure& failure);
 void AddKeyItems(const RunRecord& run, const JudgeOptions& options, std::vector<Item>* items);
 void AddToolItems(const RunRecord& run, const JudgeOptions& options, std::vector<Item>* items);
 Verdict Judge(const std::vector<Item>& items);
+Verdict JudgeWithInstaller(Verdict verdict, const Report& report);
 void DescribeSigners(const RunRecord& run, const PackageFacts& facts, Report* report);
 void AddWarnings(const std::vector<Reason>& warnings, const JudgeOptions& options, Report* report);
 
 }  // namespace
 
-Report MakeReport(const RunRecord& run, const PackageFacts& facts, const JudgeOptions& options) {
+Report MakeReport(const RunRecord& run, const PackageFacts& facts, const JudgeOptions& options,
+                  const Judgement& installer) {
   Report report;
   report.file = run.file;
   report.path = run.path;
   report.events = run.events;
+  report.installer = installer;
   report.file_size = facts.size;
   Reason failure = WhyFailed(run.failure);
   if (failure.cause == nullptr && run.is_silent && !run.signal) {
@@ -52,9 +55,10 @@ Report MakeReport(const RunRecord& run, const PackageFacts& facts, const JudgeOp
   AddLibraryItems(run, facts, options, &report.items);
   AddKeyItems(run, options, &report.items);
   AddToolItems(run, options, &report.items);
+  if (own.kind == ItemKind::kPackage) AddInstallerItem(installer, options, &report.items);
   DescribeSigners(run, facts, &report);
   AddWarnings(FindWarnings(run, facts, report), options, &report);
-  report.verdict = Judge(report.items);
+  report.verdict = JudgeWithInstaller(Judge(report.items), report);
   report.protection = FindProtection(facts, report.items);
   if (own.kind == ItemKind::kPackage) report.chain = MakeChain(facts, report);
   return report;
@@ -76,8 +80,21 @@ std::string Reason::Text() const {
   return at == std::string::npos ? text : text.replace(at, 2, detail);
 }
 
+// The verdict is the installer's where the tool signed, and the tool's or the simulation's
+// elsewhere.
+const Item* DecisiveItem(const Report& report) {
+  const bool is_installers = report.verdict == Verdict::kNotInstallable ||
+                             (report.verdict == Verdict::kNotSimulated && report.items.size() > 1);
+  for (const Item& item : report.items) {
+    const bool counts = !is_installers || item.kind == ItemKind::kInstaller;
+    if (counts && item.state == ItemState::kRefused) return &item;
+  }
+  return nullptr;
+}
+
 ExitStatus StatusOf(Verdict verdict) {
-  constexpr ExitStatus kStatuses[] = {kAllSigned,   kAllSigned,   kSomeRefused,   kSomeRefused,
+  constexpr ExitStatus kStatuses[] = {kAllSigned,   kAllSigned,   kAllSigned,
+                                      kSomeRefused, kSomeRefused, kSomeRefused,
                                       kSomeRefused, kNotLookedAt, kCannotSimulate};
   return kStatuses[static_cast<size_t>(verdict)];
 }
@@ -167,9 +184,11 @@ void AddToolItems(const RunRecord& run, const JudgeOptions& options, std::vector
   }
 }
 
-// The first item is the file itself.
+// By what the tool did alone. The first item is the file itself.
 Verdict Judge(const std::vector<Item>& items) {
-  const auto is_refused = [](const Item& item) { return item.state == ItemState::kRefused; };
+  const auto is_refused = [](const Item& item) {
+    return item.state == ItemState::kRefused && item.kind != ItemKind::kInstaller;
+  };
   const auto is_signed = [](const Item& item) {
     return item.state == ItemState::kDone && item.kind != ItemKind::kKey;
   };
@@ -180,6 +199,18 @@ Verdict Judge(const std::vector<Item>& items) {
   }
   const bool is_partly = std::any_of(items.begin(), items.end(), is_signed);
   return is_partly ? Verdict::kPartlySigned : Verdict::kRefused;
+}
+
+// Where the tool signed something, it counts what the phones' installer does with it.
+Verdict JudgeWithInstaller(Verdict verdict, const Report& report) {
+  if (verdict != Verdict::kSigned && verdict != Verdict::kPartlySigned) return verdict;
+  for (const Item& item : report.items) {
+    if (item.kind != ItemKind::kInstaller) continue;
+    const bool has_judged = item.reason.cause != &cause::kInstallerGaveUp;
+    return has_judged ? Verdict::kNotInstallable : Verdict::kNotSimulated;
+  }
+  const bool has_other = OtherSigner(report.installer, report) != nullptr;
+  return verdict == Verdict::kSigned && has_other ? Verdict::kOtherSigner : verdict;
 }
 
 // The key is the one that the kernel got with the package, or else with a library. Where it got

@@ -1,5 +1,5 @@
 // The parts of a report, each made by a file of its own: package_reason.cpp, library_items.cpp,
-// warnings.cpp and protection.cpp.
+// installer_item.cpp, warnings.cpp and protection.cpp.
 #pragma once
 
 #include <vector>
@@ -23,6 +23,18 @@ Reason WhyKernelDidNotSign(const Attempt& attempt);
 // came of each. The first item is the file's own.
 void AddLibraryItems(const RunRecord& run, const PackageFacts& facts, const JudgeOptions& options,
                      std::vector<Item>* items);
+
+// Adds an item if phones of some levels do not install the package, or if that could not be found
+// out.
+void AddInstallerItem(const Judgement& judgement, const JudgeOptions& options,
+                      std::vector<Item>* items);
+
+// A signer for whom the newest of the phones that take the package install it, and who is not the
+// JAR's; null if there is none. Of the report the signer and the key are filled.
+const CertificateFacts* OtherSigner(const Judgement& judgement, const Report& report);
+
+// Whether the key is the JAR signer's, as the kernel gets it and as the certificate shows it.
+bool IsJarSigner(const PublicKey& key, const Report& report);
 
 // What is worth knowing of a file although it changes nothing for the kernel. Of the report the
 // items, the signers and the key are filled. What the file's own item says already is not said

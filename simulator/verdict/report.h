@@ -7,6 +7,7 @@
 #include <string>
 #include <vector>
 
+#include "simulator/installer/judgement.h"
 #include "simulator/package/facts.h"
 #include "simulator/run/events.h"
 #include "simulator/verdict/causes.h"
@@ -16,15 +17,17 @@ namespace simulator {
 
 enum class Verdict {
   kSigned,
+  kOtherSigner,  // signed, and phones install it for another signer than the kernel knows it by
   kTrustedJar,
   kPartlySigned,
+  kNotInstallable,  // something was signed, and phones do not install it
   kRefused,
   kNotTrustedJar,
   kNotLookedAt,
   kNotSimulated,
 };
 
-enum class ItemKind { kPackage, kJar, kFile, kEntries, kLibrary, kKey, kTool };
+enum class ItemKind { kPackage, kJar, kFile, kEntries, kLibrary, kKey, kTool, kInstaller };
 
 // Signed or registered; should have been and was not; a library that does not lie beside the
 // package, which is refused where the user is strict; nothing to sign.
@@ -38,7 +41,7 @@ struct Reason {
   std::string Text() const;
 };
 
-// One thing that was to be signed or registered.
+// One thing that was to be signed or registered, or somebody who refuses all of it.
 struct Item {
   ItemKind kind;
   std::string name;   // of a library: below the package's directory; of a key: what it is for
@@ -91,12 +94,16 @@ struct Report {
   std::optional<CertificateFacts> signer;  // of the JAR signature
   std::vector<std::string> schemes;        // that the file carries: "v1", "v2", …
   std::vector<NewerSignerFacts> newer;     // who signed with those after v1
+  Judgement installer;
   Protection protection;
   uint64_t file_size = 0;
   std::vector<Link> chain;  // empty for what is no package
 
   Events events;  // all that happened, in order
 };
+
+// The item that the verdict comes from, such as the first that was refused; null if nothing was.
+const Item* DecisiveItem(const Report& report);
 
 // The exit status that a verdict stands for.
 ExitStatus StatusOf(Verdict verdict);

@@ -13,7 +13,6 @@ using Reasons = std::vector<Reason>;
 void WarnOfTwoFaces(const PackageFacts& facts, const Report& report, Reasons* warnings);
 void WarnOfSigners(const PackageFacts& facts, const Report& report, Reasons* warnings);
 void WarnOfOtherKeys(const PackageFacts& facts, const Report& report, Reasons* warnings);
-bool IsJarSigner(const PublicKey& key, const Report& report);
 void WarnOfStrippedSchemes(const PackageFacts& facts, Reasons* warnings);
 void WarnOfEntries(const PackageFacts& facts, Reasons* warnings);
 
@@ -39,6 +38,11 @@ std::vector<Reason> FindWarnings(const RunRecord& run, const PackageFacts& facts
     warnings.push_back({&cause::kNotLaidOut, CountedNames(run.not_laid_out)});
   }
   return warnings;
+}
+
+bool IsJarSigner(const PublicKey& key, const Report& report) {
+  if (report.key && key.modulus_sha256 != report.key->sha256) return false;
+  return !report.signer || key.sha256 == report.signer->key.sha256;
 }
 
 namespace {
@@ -88,11 +92,6 @@ void WarnOfOtherKeys(const PackageFacts& facts, const Report& report, Reasons* w
                                 ", public key SHA-256 digest: " + other->certificate.key.sha256 +
                                 ")"});
   }
-}
-
-bool IsJarSigner(const PublicKey& key, const Report& report) {
-  if (report.key && key.modulus_sha256 != report.key->sha256) return false;
-  return !report.signer || key.sha256 == report.signer->key.sha256;
 }
 
 // The signature file names the schemes by their numbers: "2, 3".

@@ -63,10 +63,11 @@ CAUSE = re.compile(r"inline constexpr Cause (?P<name>k\w+) = \{\s*(?P<code>%s),\
 GROUPS = {"kNotLookedAt": "The tool did not look at the file",
           "kSimulation": "The simulation could not tell", "kFile": "What the file is",
           "kSignature": "A package's signature", "kKernel": "The kernel", "kLibrary": "A library",
-          "kKey": "The key", "kTool": "The tool itself", "kWarning": "Warnings"}
+          "kKey": "The key", "kTool": "The tool itself",
+          "kInstaller": "The installer of the phones", "kWarning": "Warnings"}
 
 # Causes that leave the chain from the key to the entries whole: all others have to break it.
-UNBROKEN = {"kKernel", "kKey", "kWarning"}
+UNBROKEN = {"kKernel", "kKey", "kInstaller", "kWarning"}
 
 PAGE = ROOT / "docs/messages.md"
 REASONS = re.compile(r"(?<=\n)%s:\n.*" % GROUPS["kNotLookedAt"], re.S)

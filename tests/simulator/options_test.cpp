@@ -105,6 +105,29 @@ TEST(Options, InstallTakesItsValueAfterAnEqualsSignAlone) {
   EXPECT_EQ(Parsed({"--", "--install"}).files, Lines({"--install"}));
 }
 
+TEST(Options, InstallerIsAskedWhereItIsThereAboutAllPhonesOfTheTool) {
+  const Options options = Parsed({"a.apk"});
+  EXPECT_EQ(options.installer.use, InstallerUse::kAuto);
+  EXPECT_EQ(options.installer.levels.first, 27);
+  EXPECT_EQ(options.installer.levels.last, kNewestLevel);
+  EXPECT_EQ(options.installer.timeout, 30);
+  EXPECT_EQ(Parsed({"--installer=required", "a.apk"}).installer.use, InstallerUse::kRequired);
+  EXPECT_EQ(Parsed({"--installer", "off", "a.apk"}).installer.use, InstallerUse::kOff);
+  EXPECT_EQ(Parsed({"--installer=off", "--installer=auto", "a.apk"}).installer.use,
+            InstallerUse::kAuto);
+  EXPECT_EQ(Parsed({"--timeout", "2", "a.apk"}).installer.timeout, 2);
+}
+
+TEST(Options, ApiLevelsAreOneARangeOrAllFromOneOn) {
+  const auto levels = [](const std::string& text) {
+    const LevelRange range = Parsed({"--api", text, "a.apk"}).installer.levels;
+    return std::make_pair(range.first, range.last);
+  };
+  EXPECT_EQ(levels("28"), std::make_pair(28, 28));
+  EXPECT_EQ(levels("27-33"), std::make_pair(27, 33));
+  EXPECT_EQ(levels("30-"), std::make_pair(30, kNewestLevel));
+}
+
 TEST(Options, MistakesAreReportedWithStatusTwo) {
   const std::vector<Lines> mistakes = {{},
                                        {"--nonsense", "a.apk"},
@@ -114,6 +137,16 @@ TEST(Options, MistakesAreReportedWithStatusTwo) {
                                        {"--zu-result", "x", "a.apk"},
                                        {"--zu-result", "2147483648", "a.apk"},
                                        {"--trust", "/nowhere/at-all", "a.apk"},
+                                       {"--installer=maybe", "a.apk"},
+                                       {"--installer=", "a.apk"},
+                                       {"--api", "", "a.apk"},
+                                       {"--api", "0", "a.apk"},
+                                       {"--api", "x", "a.apk"},
+                                       {"--api", "30-27", "a.apk"},
+                                       {"--api", "27-x", "a.apk"},
+                                       {"--api", "27-30-33", "a.apk"},
+                                       {"--api=-30", "a.apk"},
+                                       {"--api", "99999999999", "a.apk"},
                                        {"--timeout", "0", "a.apk"},
                                        {"--timeout", "-1", "a.apk"},
                                        {"--timeout", "nan", "a.apk"},
@@ -184,7 +217,7 @@ TEST(Options, HelpFitsATerminalAndShowsDefaultsInOneWay) {
   EXPECT_EQ(help.find("=30"), std::string::npos);
   size_t defaults = 0;
   for (size_t at = 0; (at = help.find("[default: ", at)) != std::string::npos; ++at) ++defaults;
-  EXPECT_EQ(defaults, 9U);
+  EXPECT_EQ(defaults, 11U);
 }
 
 TEST(Options, VersionIsTheProjects) {

@@ -7,9 +7,9 @@
 #include "support/process.h"
 #include "support/simulation.h"
 
-// Runs apktoolkit-sim for somebody who reads UTF-8.
+// Runs apktoolkit-sim, without an installer, for somebody who reads UTF-8.
 inline ProcessResult Told(const Lines& words) {
-  Lines command = {"env", "LC_ALL=C.UTF-8", SimulatorPath()};
+  Lines command = {"env", "LC_ALL=C.UTF-8", SimulatorPath(), "--installer=off"};
   command.insert(command.end(), words.begin(), words.end());
   return RunProcess(command);
 }

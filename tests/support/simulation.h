@@ -9,8 +9,9 @@ struct Simulation {
   std::string timeline;  // see expected_timeline.h
 };
 
-// Runs the tool on `file` in the simulated phone that `options` describe. A simulation that itself
-// fails, or that writes anything on standard error, is a test failure.
+// Runs the tool on `file` in the simulated phone that `options` describe. Here and below no phone's
+// installer is asked, unless an option says so: the tool's own answers are what most tests are for.
+// A simulation that itself fails, or that writes anything on standard error, is a test failure.
 Simulation Simulate(const std::string& file, const std::vector<std::string>& options = {});
 
 // The same with more control: the whole command up to the simulator's options, and the folder.

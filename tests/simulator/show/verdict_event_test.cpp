@@ -42,6 +42,15 @@ Report WholeReport() {
   report.newer = {{"v2", *report.signer}};
   report.newer[0].certificate.key = {"EC", 256, "44", ""};
   report.newer.push_back({"v3", *report.signer});
+  RangeJudgement old, newer;
+  old.levels = {27, 29};
+  old.is_verified = true;
+  old.schemes = {"v2"};
+  old.signers = {{"v2", *report.signer}};
+  old.warnings = {{"A_WARNING", {}, "beware"}};
+  newer.levels = {30, kNewestLevel};
+  newer.errors = {{"A_FAULT", {"a", "b"}, "a b"}};
+  report.installer = {Judgement::State::kJudged, "", {old, newer}};
   report.payload = "2000ab";
   report.key = {"ab", 2048, true};
   report.protection.verified = {1, 2};
@@ -82,6 +91,15 @@ TEST(VerdictEvent, HoldsTheWholeReport) {
        "key_bits": 256, "key_sha256": "44"},
       {"scheme": "v3", "subject": "CN=a", "certificate_sha256": "11", "key_algorithm": "RSA",
        "key_bits": 2048, "key_sha256": "22", "modulus_sha256": "33"}],
+    "installer": {"state": "judged", "levels": [
+      {"first": 27, "last": 29, "installs": true,
+       "signers": [{"scheme": "v2", "subject": "CN=a", "certificate_sha256": "11",
+                    "key_algorithm": "RSA", "key_bits": 2048, "key_sha256": "22",
+                    "modulus_sha256": "33"}],
+       "errors": [], "warnings": [{"issue": "A_WARNING", "parameters": [], "text": "beware"}]},
+      {"first": 30, "installs": false, "signers": [],
+       "errors": [{"issue": "A_FAULT", "parameters": ["a", "b"], "text": "a b"}],
+       "warnings": []}]},
     "protection": {
       "verified": {"entries": 1, "bytes": 2}, "vouched": {"entries": 3, "bytes": 4},
       "unlisted": {"entries": 5, "bytes": 6}, "signature": {"entries": 7, "bytes": 8}},
@@ -106,6 +124,8 @@ TEST(VerdictEvent, EveryVerdictHasACodeAndAStatus) {
     return event["verdict"].get<std::string>() + " " + event["status"].dump();
   };
   EXPECT_EQ(code(Verdict::kSigned), "signed 0");
+  EXPECT_EQ(code(Verdict::kOtherSigner), "other-signer 0");
+  EXPECT_EQ(code(Verdict::kNotInstallable), "not-installable 1");
   EXPECT_EQ(code(Verdict::kTrustedJar), "trusted-jar 0");
   EXPECT_EQ(code(Verdict::kPartlySigned), "partly-signed 1");
   EXPECT_EQ(code(Verdict::kRefused), "refused 1");
@@ -128,6 +148,7 @@ TEST(VerdictEvent, EveryKindAndStateHasACode) {
   EXPECT_EQ(item(ItemKind::kLibrary, ItemState::kAbsent), "library absent");
   EXPECT_EQ(item(ItemKind::kKey, ItemState::kDone), "key registered");
   EXPECT_EQ(item(ItemKind::kTool, ItemState::kNothing), "tool nothing-to-sign");
+  EXPECT_EQ(item(ItemKind::kInstaller, ItemState::kRefused), "installer refused");
 }
 
 TEST(VerdictEvent, EveryStateOfALinkHasACode) {
