@@ -8,12 +8,10 @@
 #include <cerrno>
 
 #include "apk/apk.h"
-#include "apk/entry_digests.h"
 #include "apk/native_libraries.h"
 #include "simulator/package/signing_block.h"
 #include "util/file.h"
 #include "util/scoped_fd.h"
-#include "util/text.h"
 
 namespace simulator {
 
@@ -24,16 +22,14 @@ constexpr int kOpenFlags = O_RDONLY | O_CLOEXEC | O_NONBLOCK | O_NOCTTY;
 
 FileKind KindOf(int fd, uint64_t size);
 bool IsText(const std::string& start);
-void ReadArchive(int fd, PackageFacts* facts);
-void ListEntries(Archive* archive, PackageFacts* facts);
-bool IsSignatureName(const std::string& name);
+void ReadArchive(int fd, const IsLate& is_late, PackageFacts* facts);
 void FindLibraries(const Archive& archive, const std::string& path, PackageFacts* facts);
 LibraryFacts FindLibrary(const std::string& entry, const std::string& path);
 void ReadNewerSigners(int fd, PackageFacts* facts);
 
 }  // namespace
 
-PackageFacts LookAt(const std::string& path) {
+PackageFacts LookAt(const std::string& path, const IsLate& is_late) {
   PackageFacts facts;
   const ScopedFd file(open(path.c_str(), kOpenFlags));
   struct stat state = {};
@@ -50,7 +46,7 @@ PackageFacts LookAt(const std::string& path) {
   } else {
     facts.size = static_cast<uint64_t>(state.st_size);
     facts.kind = KindOf(file.get(), facts.size);
-    if (facts.kind == FileKind::kArchive) ReadArchive(file.get(), &facts);
+    if (facts.kind == FileKind::kArchive) ReadArchive(file.get(), is_late, &facts);
   }
   return facts;
 }
@@ -84,43 +80,23 @@ bool IsText(const std::string& start) {
   });
 }
 
-void ReadArchive(int fd, PackageFacts* facts) {
+void ReadArchive(int fd, const IsLate& is_late, PackageFacts* facts) {
   Archive archive(fd, &facts->archive_result);
   if (facts->archive_result != 0) return;
   std::vector<uint8_t> manifest;
   archive.Read(kAndroidManifestName, &manifest);
   facts->manifest = ParseAndroidManifest(manifest);
   facts->jar = ReadJarSignature(&archive);
-  ListEntries(&archive, facts);
+  std::vector<uint8_t> text;
+  facts->jar.manifest = archive.Read(ApkTools::Apk::kMANIFEST_MF, &text);
+  PackageEntries entries = CompareEntries(&archive, std::move(text), is_late);
+  facts->entries = std::move(entries.all);
+  facts->missing = std::move(entries.missing);
   FindLibraries(archive, GetFilenameByFd(fd), facts);
   facts->too_long = archive.too_long();
   if (facts->manifest.has_overlaps) facts->too_long.push_back(kAndroidManifestName);
   ReadNewerSigners(fd, facts);
   facts->was_changed = archive.HasShrunk();
-}
-
-void ListEntries(Archive* archive, PackageFacts* facts) {
-  std::vector<uint8_t> text;
-  facts->jar.manifest = archive->Read(ApkTools::Apk::kMANIFEST_MF, &text);
-  ApkTools::EntryDigests manifest;
-  manifest.Load(std::move(text));
-  manifest.List();
-  std::string digest_name, digest;
-  for (ArchiveEntry& entry : archive->Entries()) {
-    const bool is_listed = manifest.Find(entry.name, digest_name, digest);
-    const bool is_signature = IsSignatureName(entry.name);
-    facts->entries.push_back({std::move(entry), is_listed, is_signature});
-  }
-}
-
-// The manifest, signature files and their blocks, which no manifest lists.
-bool IsSignatureName(const std::string& name) {
-  constexpr std::string_view kDirectory = "META-INF/";
-  if (name == ApkTools::Apk::kMANIFEST_MF) return true;
-  if (name.compare(0, kDirectory.size(), kDirectory) != 0) return false;
-  if (name.find('/', kDirectory.size()) != std::string::npos) return false;
-  return EndsWith(name, ".SF") || EndsWith(name, ".RSA") || EndsWith(name, ".EC") ||
-         EndsWith(name, ".DSA");
 }
 
 // The tool's walk names all but the damaged ones.

@@ -11,6 +11,7 @@
 #include "simulator/package/android_manifest.h"
 #include "simulator/package/archive.h"
 #include "simulator/package/certificate.h"
+#include "simulator/package/entries.h"
 #include "simulator/package/jar_signature.h"
 
 namespace simulator {
@@ -30,12 +31,6 @@ enum class FileKind {
 struct NewerSignerFacts {
   std::string scheme;  // "v2", "v3" or "v3.1"
   CertificateFacts certificate;
-};
-
-struct ListedEntry {
-  ArchiveEntry entry;
-  bool is_listed;     // the manifest has a digest for it
-  bool is_signature;  // it belongs to a JAR signature itself
 };
 
 // A library lib/….so of the package, and what lies where the tool looks for it.
@@ -64,13 +59,16 @@ struct PackageFacts {
   bool has_damaged_signing_block = false;
   std::vector<std::string> too_long;  // what is there and was not looked into, for its length
   std::vector<ListedEntry> entries;
+  std::vector<std::string> missing;  // names that the manifest lists, and there is no such entry
   // In the order in which the tool walks through them, damaged ones last.
   std::vector<LibraryFacts> libraries;
 };
 
 // Looks at the file at `path`, and at the libraries beside it. Neither a pipe nor a device is read,
-// and nothing is waited for.
-PackageFacts LookAt(const std::string& path);
+// and nothing is waited for. Once `is_late` says so, no further entry is compared with the
+// manifest.
+PackageFacts LookAt(
+    const std::string& path, const IsLate& is_late = [] { return false; });
 
 // The names of the schemes after v1 that somebody signed with, each once, in the file's order.
 std::vector<std::string> NewerSchemes(const PackageFacts& facts);

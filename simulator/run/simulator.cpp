@@ -99,7 +99,7 @@ FileRun Simulator::Run(const std::string& file) {
   run.record.not_extracted = installation.not_extracted();
   // What cannot be judged is not looked at.
   if (task.failure.kind != Failure::Kind::kNone) return run;
-  run.facts = LookAt(installed);
+  run.facts = LookAt(installed, [&task] { return task.deadline.HasPassed(); });
   struct stat after = {};
   const bool is_same = stat(installed.c_str(), &after) == 0 && IsSameFile(before, after);
   run.facts.was_changed = run.facts.was_changed || (is_there && !is_same);

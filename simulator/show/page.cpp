@@ -153,6 +153,8 @@ void AddPicture(const Report& report, data* file) {
   file->set("description", Shown(description));
   file->set("parts", parts);
   const auto name = [](const std::string& entry) { return object{{"entry", Shown(Short(entry))}}; };
+  AddLines("differing", report.protection.differing_names, "", name, file);
+  AddLines("missing", report.protection.missing_names, "", name, file);
   AddLines("unlisted", report.protection.unlisted_names, "", name, file);
 }
 

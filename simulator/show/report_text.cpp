@@ -98,8 +98,11 @@ void Printer::PrintWarnings() {
 }
 
 void Printer::PrintUnlisted() {
-  for (const std::string& name : report_.protection.unlisted_names) {
-    Print(std::string("      ") + kUnlistedWord + ": " + name);
+  const Protection& all = report_.protection;
+  for (const auto& [names, word] : {std::make_pair(&all.differing_names, kDifferingWord),
+                                    std::make_pair(&all.missing_names, kMissingWord),
+                                    std::make_pair(&all.unlisted_names, kUnlistedWord)}) {
+    for (const std::string& name : *names) Print(std::string("      ") + word + ": " + name);
   }
 }
 
@@ -111,8 +114,14 @@ void Printer::PrintSigner() {
   const std::string takers = TakersText(report_.installer);
   if (!takers.empty()) Print("    installer: " + takers);
   const Protection& all = report_.protection;
-  Print("    protects: " + ShareText(all.verified, kVerifiedWord) + ", " +
-        ShareText(all.vouched, kVouchedWord) + ", " + ShareText(all.unlisted, kUnlistedWord));
+  std::string text = ShareText(all.verified, kVerifiedWord) + ", " +
+                     ShareText(all.vouched, kVouchedWord) + ", " +
+                     ShareText(all.unlisted, kUnlistedWord);
+  if (all.differing.entries > 0) text += ", " + ShareText(all.differing, kDifferingWord);
+  if (all.uncompared.entries > 0) text += ", " + ShareText(all.uncompared, kUncomparedWord);
+  const uint64_t missing = all.missing_names.size();
+  if (missing > 0) text += ", " + Counted(missing, "entry ", "entries ") + kMissingWord;
+  Print("    protects: " + text);
 }
 
 void Printer::PrintNewerSigners() {

@@ -83,9 +83,41 @@ std::string ShareJson(const Share& share) {
       {{"entries", std::to_string(share.entries)}, {"bytes", std::to_string(share.bytes)}});
 }
 
+Share Sum(std::initializer_list<Share> shares) {
+  Share sum;
+  for (const Share& share : shares) {
+    sum.entries += share.entries;
+    sum.bytes += share.bytes;
+  }
+  return sum;
+}
+
+std::string NamesJson(const std::vector<std::string>& names) {
+  return List(names, [](const std::string& name) { return EncodeText(name); });
+}
+
+// Whether the entries are as the manifest lists them, and at how many of them the tool looked.
+std::string EntriesJson(const Protection& all) {
+  const auto share = [](const Share& counted, Members members) {
+    members.insert(members.begin(), {{"entries", std::to_string(counted.entries)},
+                                     {"bytes", std::to_string(counted.bytes)}});
+    return Object(members);
+  };
+  const std::string matching_seen = std::to_string(all.verified.entries);
+  return Object(
+      {{"matching", share(Sum({all.verified, all.vouched}), {{"looked_at", matching_seen}})},
+       {"differing", share(all.differing, {{"looked_at", std::to_string(all.differing_seen)},
+                                           {"names", NamesJson(all.differing_names)}})},
+       {"missing", Object({{"entries", std::to_string(all.missing_names.size())},
+                           {"names", NamesJson(all.missing_names)}})},
+       {"unlisted", share(all.unlisted, {{"names", NamesJson(all.unlisted_names)}})},
+       {"uncompared", share(all.uncompared, {})}});
+}
+
 std::string ProtectionJson(const Protection& protection) {
   return Object({{"verified", ShareJson(protection.verified)},
-                 {"vouched", ShareJson(protection.vouched)},
+                 {"vouched", ShareJson(Sum({protection.vouched, protection.differing,
+                                            protection.uncompared}))},
                  {"unlisted", ShareJson(protection.unlisted)},
                  {"signature", ShareJson(protection.signature)}});
 }
@@ -142,6 +174,7 @@ std::string VerdictEvent(const Report& report) {
   event.Json("signers", SignersJson(report));
   event.Json("installer", InstallerJson(report.installer));
   event.Json("protection", ProtectionJson(report.protection));
+  event.Json("entries", EntriesJson(report.protection));
   event.Json("chain", List(report.chain, LinkJson));
   return event.Line();
 }

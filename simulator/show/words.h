@@ -62,6 +62,9 @@ Rows SignerRows(const Report& report);
 // The words for a share of the package.
 inline constexpr char kVerifiedWord[] = "verified";
 inline constexpr char kVouchedWord[] = "listed and not verified";
+inline constexpr char kDifferingWord[] = "other than listed";
+inline constexpr char kUncomparedWord[] = "listed and not compared";
 inline constexpr char kUnlistedWord[] = "not listed";
+inline constexpr char kMissingWord[] = "listed and missing";
 
 }  // namespace simulator

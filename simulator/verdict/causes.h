@@ -260,6 +260,11 @@ inline constexpr Cause kLibraryChanged = {"library-changed", Group::kLibrary, Se
     ChainLink::kEntries, "`VeltSignJni: File not verified`",
     "its bytes are not those that the manifest lists",
     "The file beside the package was changed after it was installed. Install the package again."};
+inline constexpr Cause kLibraryChangedInside = {"library-changed-inside", Group::kLibrary,
+    Severity::kRefused, ChainLink::kEntries, "`VeltSignJni: File not verified`",
+    "the package's own copy of it is not what its manifest lists",
+    "Sign the package again, as the last step that changes it. If nobody changed it: do not trust "
+    "it."};
 inline constexpr Cause kLibraryNotListed = {"library-not-listed", Group::kLibrary,
     Severity::kRefused, ChainLink::kEntries, "`Can't find file in`",
     "the manifest does not list it: it was added after signing",
@@ -356,6 +361,18 @@ inline constexpr Cause kSeveralSigners = {"several-signers", Group::kWarning, Se
 inline constexpr Cause kForgeableKey = {"forgeable-key", Group::kWarning, Severity::kWarning,
     ChainLink::kNone, "", "the key has the public exponent %s: anyone can make its signatures",
     "Do not trust this package. A key of one's own has the exponent 65537."};
+inline constexpr Cause kEntriesChanged = {"entries-changed", Group::kWarning, Severity::kWarning,
+    ChainLink::kNone, "", "%s: other than the manifest lists, and the tool does not look there",
+    "Sign the package again, as the last step that changes it. If it is not of your making: do not "
+    "trust it."};
+inline constexpr Cause kEntriesMissing = {"entries-missing", Group::kWarning, Severity::kWarning,
+    ChainLink::kNone, "", "%s: in the manifest and not in the package",
+    "Sign the package again, as the last step that changes it. If it is not of your making: do not "
+    "trust it."};
+inline constexpr Cause kEntriesNotCompared = {"entries-not-compared", Group::kWarning,
+    Severity::kAlarm, ChainLink::kNone, "", "%s not compared with the manifest: too long, of "
+    "another digest than SHA-1 and SHA-256, or the time was up",
+    "Run it again with a larger --timeout. Entries above 512 MiB are not compared."};
 inline constexpr Cause kUnlistedEntries = {"unlisted-entries", Group::kWarning, Severity::kWarning,
     ChainLink::kNone, "", "the signature does not protect %s: no digest in the manifest",
     "Sign the package again, as the last step that changes it; --verbose lists them."};

@@ -111,7 +111,12 @@ Reason WhyNotVerified(const Library& library, const PackageFacts& facts) {
   if (why == LogMeaning::kFileNotRead) return {&cause::kLibraryNoFile, ""};
   if (why == LogMeaning::kNotListed) return {&cause::kLibraryNotListed, ""};
   if (why == LogMeaning::kDigestUnknown) return {&cause::kLibraryDigest, ""};
-  return {&cause::kLibraryChanged, ""};
+  const std::string& name = library.facts.entry;
+  const bool is_changed_inside =
+      std::any_of(facts.entries.begin(), facts.entries.end(), [&](const ListedEntry& each) {
+        return each.entry.name == name && each.digest == EntryDigest::kDiffers;
+      });
+  return {is_changed_inside ? &cause::kLibraryChangedInside : &cause::kLibraryChanged, ""};
 }
 
 // The tool does not log why a file does not open; the file system still knew.

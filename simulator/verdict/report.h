@@ -65,11 +65,16 @@ struct Share {
 };
 
 struct Protection {
-  Share verified;   // dex and libraries, whose digests were compared with the manifest
-  Share vouched;    // in the manifest, and not compared or not the same
+  Share verified;   // as the manifest lists them, and the tool looked at them: dex and libraries
+  Share vouched;    // as the manifest lists them, and the tool did not look at them
   Share unlisted;   // not in the manifest
   Share signature;  // the manifest, signature files and blocks
   std::vector<std::string> unlisted_names;
+  Share differing = {};         // other than the manifest lists them
+  Share uncompared = {};        // in the manifest, and not compared with it
+  uint64_t differing_seen = 0;  // of the differing entries, at how many the tool looked
+  std::vector<std::string> differing_names = {};
+  std::vector<std::string> missing_names = {};  // in the manifest, and not in the package
 };
 
 enum class LinkState { kHolds, kBroken, kNotReached };

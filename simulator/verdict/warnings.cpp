@@ -14,7 +14,8 @@ void WarnOfTwoFaces(const PackageFacts& facts, const Report& report, Reasons* wa
 void WarnOfSigners(const PackageFacts& facts, const Report& report, Reasons* warnings);
 void WarnOfOtherKeys(const PackageFacts& facts, const Report& report, Reasons* warnings);
 void WarnOfStrippedSchemes(const PackageFacts& facts, Reasons* warnings);
-void WarnOfEntries(const PackageFacts& facts, Reasons* warnings);
+void WarnOfEntries(const PackageFacts& facts, const Report& report, Reasons* warnings);
+bool IsSaid(const std::string& entry, const Report& report);
 
 }  // namespace
 
@@ -33,7 +34,7 @@ std::vector<Reason> FindWarnings(const RunRecord& run, const PackageFacts& facts
   for (const std::string& what : facts.too_long) {
     warnings.push_back({&cause::kNotLookedInto, what});
   }
-  if (is_package) WarnOfEntries(facts, &warnings);
+  if (is_package) WarnOfEntries(facts, report, &warnings);
   if (!run.not_laid_out.empty()) {
     warnings.push_back({&cause::kNotLaidOut, CountedNames(run.not_laid_out)});
   }
@@ -106,21 +107,42 @@ void WarnOfStrippedSchemes(const PackageFacts& facts, Reasons* warnings) {
   if (!missing.empty()) warnings->push_back({&cause::kSchemesStripped, Joined(missing)});
 }
 
-void WarnOfEntries(const PackageFacts& facts, Reasons* warnings) {
+void WarnOfEntries(const PackageFacts& facts, const Report& report, Reasons* warnings) {
   const bool has_list = facts.jar.manifest == Archive::ReadResult::kRead;
   uint64_t unlisted = 0;
   uint64_t bytes = 0;
-  std::vector<std::string> damaged;
+  std::vector<std::string> damaged, changed, uncompared;
   for (const ListedEntry& each : facts.entries) {
     if (each.entry.is_damaged) damaged.push_back(each.entry.name);
+    const bool is_lost = each.digest == EntryDigest::kNotCompared && !each.entry.is_damaged;
+    if (is_lost) uncompared.push_back(each.entry.name);
+    if (each.digest == EntryDigest::kDiffers && !IsSaid(each.entry.name, report)) {
+      changed.push_back(each.entry.name);
+    }
     if (!has_list || each.is_listed || each.is_signature) continue;
     ++unlisted;
     bytes += each.entry.size;
   }
   if (!damaged.empty()) warnings->push_back({&cause::kEntriesDamaged, CountedNames(damaged)});
+  if (!changed.empty()) warnings->push_back({&cause::kEntriesChanged, CountedNames(changed)});
+  if (!facts.missing.empty()) {
+    warnings->push_back({&cause::kEntriesMissing, CountedNames(facts.missing)});
+  }
+  if (!uncompared.empty()) {
+    warnings->push_back({&cause::kEntriesNotCompared, CountedNames(uncompared)});
+  }
   if (unlisted == 0) return;
   warnings->push_back({&cause::kUnlistedEntries, Counted(unlisted, "entry", "entries") + " (" +
                                                      Counted(bytes, "byte", "bytes") + ")"});
+}
+
+// Whether an item says of the entry already that it is not the one that was signed.
+bool IsSaid(const std::string& entry, const Report& report) {
+  return std::any_of(report.items.begin(), report.items.end(), [&](const Item& item) {
+    const Cause* const why = item.reason.cause;
+    return (why == &cause::kDexChanged && entry == "classes.dex") ||
+           (why == &cause::kLibraryChangedInside && item.entry == entry);
+  });
 }
 
 }  // namespace

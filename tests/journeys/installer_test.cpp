@@ -39,8 +39,9 @@ Lines Told(const std::string& name, const Lines& options = {}) {
   return told;
 }
 
-json VerdictOf(const std::string& name) {
-  std::istringstream lines(Run(name, {"--json"}).output);
+json VerdictOf(const std::string& name, Lines options = {}) {
+  options.emplace_back("--json");
+  std::istringstream lines(Run(name, options).output);
   json event;
   for (std::string line; std::getline(lines, line);) event = json::parse(line);
   return event;
@@ -79,6 +80,32 @@ TEST(Installer, RefusesALibraryChangedInsideThePackage) {
                    "phones do not install it: lib/arm64-v8a/libvault.so was changed after it was "
                    "signed",
                    "-> 1"}));
+}
+
+TEST(Entries, AreComparedByTheToolsOwnCodeWhereNobodyAsksAnInstaller) {
+  const json event = VerdictOf("foreign-manifest", {"--installer=off"});
+  EXPECT_EQ(event["verdict"], "signed");
+  EXPECT_EQ(event["entries"]["differing"]["names"], json({"AndroidManifest.xml"}));
+  EXPECT_EQ(event["entries"]["differing"]["looked_at"], 0);
+  EXPECT_EQ(event["entries"]["matching"]["entries"], 3);
+  EXPECT_EQ(event["entries"]["matching"]["looked_at"], 3);
+  ASSERT_EQ(event["warnings"].size(), 1U);
+  EXPECT_EQ(event["warnings"][0]["reason"], "entries-changed");
+  const json without = VerdictOf("without-dex", {"--installer=off"});
+  EXPECT_EQ(without["entries"]["missing"]["names"], json({"classes.dex"}));
+  ASSERT_EQ(without["warnings"].size(), 1U);
+  EXPECT_EQ(without["warnings"][0]["reason"], "entries-missing");
+}
+
+// The library beside the package came from it a moment ago: nobody changed it there.
+TEST(Entries, LibraryChangedInsideThePackageIsNotBlamedOnTheInstallation) {
+  const json event = VerdictOf("changed-inside", {"--installer=off", "--install"});
+  EXPECT_EQ(event["verdict"], "partly-signed");
+  EXPECT_EQ(event["items"][1]["reason"], "library-changed-inside");
+  EXPECT_EQ(event["items"][1]["text"],
+            "the package's own copy of it is not what its manifest lists");
+  EXPECT_EQ(event["warnings"], json::array());
+  EXPECT_EQ(event["entries"]["differing"]["looked_at"], 1);
 }
 
 // Phones of API 27 go by v2, newer ones by v3.

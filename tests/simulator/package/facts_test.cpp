@@ -134,6 +134,40 @@ TEST(PackageFacts, ListedAreTheEntriesThatTheToolFindsADigestFor) {
             std::vector<std::string>({"a", "c"}));
 }
 
+// The digests are those of "x", as coreutils and xxd print them: printf x | sha256sum | xxd -r -p |
+// base64, and the same with sha1sum.
+TEST(PackageFacts, EachListedEntryIsComparedWithItsDigest) {
+  const std::string manifest =
+      "Manifest-Version: 1.0\r\n\r\n"
+      "Name: same\r\nSHA-256-Digest: LXEWQrcmsEQBYnyp+6wy9chTD7GQPMTbAiWHF5IaSIE=\r\n\r\n"
+      "Name: same1\r\nSHA1-Digest: EfatjsUqKYSrqv18O1FlA3hcIHI=\r\n\r\n"
+      "Name: other\r\nSHA-256-Digest: LXEWQrcmsEQBYnyp+6wy9chTD7GQPMTbAiWHF5IaSIE=\r\n\r\n"
+      "Name: unknown\r\nSHA-512-Digest: AAAA\r\n\r\n"
+      "Name: gone\r\nSHA-256-Digest: AAAA\r\n\r\n"
+      "Name: gone\r\nSHA-256-Digest: AAAA\r\n\r\n"
+      "Name: damaged\r\nSHA-256-Digest: AAAA\r\n\r\n";
+  PackageOptions options = WithManifest(manifest);
+  options.entries = {{"same", ToBytes("x")},  {"same1", ToBytes("x")},
+                     {"other", ToBytes("y")}, {"unknown", ToBytes("x")},
+                     {"added", ToBytes("x")}, {"damaged", ToBytes("long")}};
+  Package package = MakePackage(options);
+  package.Item("damaged").local.crc = 1;
+  const DiskFile file(package.Build());
+  const auto with = [](const PackageFacts& facts, EntryDigest digest) {
+    return NamesWhere(facts, [digest](const auto& e) { return e.digest == digest; });
+  };
+  const PackageFacts facts = LookAt(file.path());
+  EXPECT_EQ(with(facts, EntryDigest::kMatches), std::vector<std::string>({"same", "same1"}));
+  EXPECT_EQ(with(facts, EntryDigest::kDiffers), std::vector<std::string>({"other"}));
+  EXPECT_EQ(with(facts, EntryDigest::kNotCompared),
+            std::vector<std::string>({"damaged", "unknown"}));
+  EXPECT_EQ(facts.missing, std::vector<std::string>({"gone"}));
+  // Nothing is called the same that nobody had time to compare.
+  const PackageFacts late = LookAt(file.path(), [] { return true; });
+  EXPECT_EQ(with(late, EntryDigest::kMatches), std::vector<std::string>());
+  EXPECT_EQ(with(late, EntryDigest::kNotCompared).size(), 5U);
+}
+
 // What lies below a directory of META-INF is an entry like others.
 TEST(PackageFacts, SignatureFilesLieInMetaInfItself) {
   Package package = MakePackage();

@@ -55,6 +55,12 @@ Report WholeReport() {
   report.key = {"ab", 2048, true};
   report.protection.verified = {1, 2};
   report.protection.vouched = {3, 4};
+  report.protection.differing = {10, 20};
+  report.protection.differing_seen = 9;
+  report.protection.differing_names = {"a"};
+  report.protection.uncompared = {100, 200};
+  report.protection.missing_names = {"b"};
+  report.protection.unlisted_names = {"c"};
   report.protection.unlisted = {5, 6};
   report.protection.signature = {7, 8};
   report.chain = {{"key", LinkState::kHolds, "RSA-2048"},
@@ -101,8 +107,14 @@ TEST(VerdictEvent, HoldsTheWholeReport) {
        "errors": [{"issue": "A_FAULT", "parameters": ["a", "b"], "text": "a b"}],
        "warnings": []}]},
     "protection": {
-      "verified": {"entries": 1, "bytes": 2}, "vouched": {"entries": 3, "bytes": 4},
+      "verified": {"entries": 1, "bytes": 2}, "vouched": {"entries": 113, "bytes": 224},
       "unlisted": {"entries": 5, "bytes": 6}, "signature": {"entries": 7, "bytes": 8}},
+    "entries": {
+      "matching": {"entries": 4, "bytes": 6, "looked_at": 1},
+      "differing": {"entries": 10, "bytes": 20, "looked_at": 9, "names": ["a"]},
+      "missing": {"entries": 1, "names": ["b"]},
+      "unlisted": {"entries": 5, "bytes": 6, "names": ["c"]},
+      "uncompared": {"entries": 100, "bytes": 200}},
     "chain": [
       {"link": "key", "state": "holds", "text": "RSA-2048"},
       {"link": "entries", "state": "broken", "text": "x"},

@@ -233,3 +233,33 @@ TEST(Warnings, OfAJarAreNotThoseOfAPackage) {
   facts.manifest.installer_name = "x";
   EXPECT_EQ(Warnings(facts, ReportOf(facts, ItemKind::kJar)), Lines());
 }
+
+// ---- Entries that are not as the manifest lists them.
+
+TEST(Warnings, EntriesThatAreOtherThanListedMissingOrNotCompared) {
+  PackageFacts facts = Good();
+  facts.entries = {{{"same", 1, false}, true, false, EntryDigest::kMatches},
+                   {{"a", 1, false}, true, false, EntryDigest::kDiffers},
+                   {{"b", 1, false}, true, false, EntryDigest::kDiffers},
+                   {{"long", 1, false}, true, false, EntryDigest::kNotCompared}};
+  facts.missing = {"gone"};
+  EXPECT_EQ(Warnings(facts),
+            Lines({"entries-changed: 2 entries: a, ...", "entries-missing: 1 entry: gone",
+                   "entries-not-compared: 1 entry: long"}));
+  EXPECT_EQ(cause::kEntriesNotCompared.severity, Severity::kAlarm);
+}
+
+TEST(Warnings, WhatAnItemSaysIsNotSaidTwice) {
+  PackageFacts facts = Good();
+  facts.entries = {{{"classes.dex", 1, false}, true, false, EntryDigest::kDiffers},
+                   {{"lib/arm64-v8a/a.so", 1, false}, true, false, EntryDigest::kDiffers},
+                   {{"damaged", 1, true}, true, false, EntryDigest::kNotCompared}};
+  Report report = ReportOf(facts);
+  report.items[0].reason.cause = &cause::kDexChanged;
+  report.items.push_back({ItemKind::kLibrary,
+                          "lib/arm64/a.so",
+                          "lib/arm64-v8a/a.so",
+                          ItemState::kRefused,
+                          {&cause::kLibraryChangedInside, ""}});
+  EXPECT_EQ(Warnings(facts, report), Lines({"entries-damaged: 1 entry: damaged"}));
+}
