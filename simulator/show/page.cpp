@@ -20,6 +20,7 @@ using kainjow::mustache::object;
 // The fields of the template's sections. Every text goes through Shown, and the template escapes
 // it.
 data FileFields(const Report& report, size_t number);
+std::string HeadText(const Report& report);
 list HeadLines(const Report& report);
 void AddItems(const Report& report, data* file);
 void AddPicture(const Report& report, data* file);
@@ -67,6 +68,7 @@ data FileFields(const Report& report, size_t number) {
                      {"file", Shown(Short(report.file))},
                      {"verdict", Shown(words.word)},
                      {"mood", Shown(kMoods[static_cast<size_t>(words.mood)])},
+                     {"why", Shown(HeadText(report))},
                      {"about", HeadLines(report)}};
   AddItems(report, &file);
   const auto warn = [](const Reason& warning) {
@@ -97,6 +99,15 @@ data FileFields(const Report& report, size_t number) {
   return file;
 }
 
+// For the table of files: what stands in the line of the verdict.
+std::string HeadText(const Report& report) {
+  std::string text;
+  for (const std::string& fact : HeadFacts(report, "…")) {
+    text += (text.empty() ? "" : " · ") + Short(fact);
+  }
+  return text;
+}
+
 // What is long is cut before it is put together, so that the key stands behind a name of any
 // length.
 list HeadLines(const Report& report) {
@@ -107,7 +118,8 @@ list HeadLines(const Report& report) {
   head.key = report.key;
   for (const Reason& warning : report.warnings) head.warnings.push_back(Short(warning));
   list lines;
-  for (const std::string& fact : HeadFacts(head, "…")) lines.push_back({"fact", Shown(fact)});
+  for (const std::string& fact : OwnerFacts(head, "…")) lines.push_back({"fact", Shown(fact)});
+  for (const std::string& fact : AlarmFacts(head)) lines.push_back({"fact", Shown(fact)});
   return lines;
 }
 

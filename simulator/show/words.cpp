@@ -40,9 +40,34 @@ std::string Summary(const std::vector<Verdict>& verdicts) {
 }
 
 std::vector<std::string> HeadFacts(const Report& report, const char* ellipsis) {
+  const std::string reason = DecisiveReason(report);
+  std::vector<std::string> facts = {reason};
+  if (reason.empty()) facts = OwnerFacts(report, ellipsis);
+  for (const std::string& alarm : AlarmFacts(report)) facts.push_back(alarm);
+  const size_t warnings = report.warnings.size();
+  if (warnings > 0) facts.push_back(Counted(warnings, "warning", "warnings"));
+  return facts;
+}
+
+std::string DecisiveReason(const Report& report) {
+  const Item* const item = DecisiveItem(report);
+  if (item == nullptr) return {};
+  return (item->kind == ItemKind::kLibrary ? item->name + ": " : "") + item->reason.Text();
+}
+
+std::vector<std::string> OwnerFacts(const Report& report, const char* ellipsis) {
   std::vector<std::string> facts;
   if (!report.package_name.empty()) facts.push_back(report.package_name);
   if (report.signer || report.key) facts.push_back("signer " + SignerText(report, ellipsis));
+  if (report.verdict == Verdict::kOtherSigner) {
+    const CertificateFacts* const other = OtherSigner(report.installer, report);
+    if (other != nullptr) facts.push_back("phones install it for " + other->subject);
+  }
+  return facts;
+}
+
+std::vector<std::string> AlarmFacts(const Report& report) {
+  std::vector<std::string> facts;
   for (const Reason& warning : report.warnings) {
     if (warning.cause->severity == Severity::kAlarm) facts.push_back("! " + warning.Text());
   }

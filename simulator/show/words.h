@@ -27,8 +27,19 @@ const VerdictWords& WordsOf(Verdict verdict);
 // Such as "3 files: 1 signed, 2 refused".
 std::string Summary(const std::vector<Verdict>& verdicts);
 
-// What stands in the line of the verdict behind the file: the package's name, the signer and his
-// key, and the warnings that are alarms. `ellipsis` stands in the midst of a digest.
+// Whose package it is: its name, the signer and his key, and, where phones install it for another,
+// that one. `ellipsis` stands in the midst of a digest.
+std::vector<std::string> OwnerFacts(const Report& report, const char* ellipsis);
+
+// The warnings that are alarms.
+std::vector<std::string> AlarmFacts(const Report& report);
+
+// Why the verdict is not better: the reason of the item that it comes from; empty if nothing was
+// refused.
+std::string DecisiveReason(const Report& report);
+
+// What stands in the line of the verdict behind the file: the decisive reason, or else whose
+// package it is; then the alarms, and how many warnings there are in all.
 std::vector<std::string> HeadFacts(const Report& report, const char* ellipsis);
 
 // What stands before a line.

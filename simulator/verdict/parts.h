@@ -29,10 +29,6 @@ void AddLibraryItems(const RunRecord& run, const PackageFacts& facts, const Judg
 void AddInstallerItem(const Judgement& judgement, const JudgeOptions& options,
                       std::vector<Item>* items);
 
-// A signer for whom the newest of the phones that take the package install it, and who is not the
-// JAR's; null if there is none. Of the report the signer and the key are filled.
-const CertificateFacts* OtherSigner(const Judgement& judgement, const Report& report);
-
 // Whether the key is the JAR signer's, as the kernel gets it and as the certificate shows it.
 bool IsJarSigner(const PublicKey& key, const Report& report);
 

@@ -110,6 +110,10 @@ struct Report {
 // The item that the verdict comes from, such as the first that was refused; null if nothing was.
 const Item* DecisiveItem(const Report& report);
 
+// A signer for whom the newest of the phones that take the package install it, and who is not the
+// JAR's; null if there is none. Of the report the signer and the key are filled.
+const CertificateFacts* OtherSigner(const Judgement& judgement, const Report& report);
+
 // The exit status that a verdict stands for.
 ExitStatus StatusOf(Verdict verdict);
 

@@ -4,6 +4,7 @@
 #include <sys/stat.h>
 #include <unistd.h>
 
+#include <algorithm>
 #include <filesystem>
 
 #include "support/files.h"
@@ -17,15 +18,38 @@ namespace {
 namespace fs = std::filesystem;
 using Lines = std::vector<std::string>;
 
-// The packages' verdict lines after the word and the file, by their signers.
-constexpr char kVault[] = "   com.example.vault";
 constexpr char kSigned[] = "  ✓ package                signed with the payload of that key";
 
-std::string By(const std::string& subject, const std::string& key) {
-  return std::string(kVault) + "   signer CN=" + subject + ", O=Example, " + key;
+std::string ByRsa2048() {
+  return "   com.example.vault   signer CN=rsa-2048, O=Example, RSA-2048, key 98302ce8…f64646";
 }
 
-std::string ByRsa2048() { return By("rsa-2048", "RSA-2048, key 98302ce8…f64646"); }
+constexpr size_t kAll = 1000;
+
+// The first lines of all, and the status. Where something was refused, the line of the verdict has
+// the reason of the first line with a cross; here it is left out again.
+Lines WithoutReason(size_t lines, Lines all) {
+  const auto is_cross = [](const std::string& line) { return line.rfind("  ✗ ", 0) == 0; };
+  const auto cross = std::find_if(all.begin(), all.end(), is_cross);
+  if (cross != all.end()) {
+    const size_t file = all[0].find("  ") + 2;
+    const size_t reason = all[0].find("   ", file);
+    EXPECT_NE(reason, std::string::npos) << all[0];
+    const size_t end = std::min(all[0].find("   ", reason + 3), all[0].size());
+    std::string why = all[0].substr(reason + 3, end - reason - 3);
+    if (why.rfind("lib/", 0) == 0) {
+      EXPECT_EQ(cross->find(why.substr(0, why.find(": "))), std::string("  ✗ ").size());
+      why = why.substr(why.find(": ") + 2);
+    }
+    EXPECT_EQ(cross->substr(cross->size() - std::min(cross->size(), why.size())), why);
+    EXPECT_NE(why, "");
+    all[0].resize(reason);
+  }
+  const std::string status = all.back();
+  all.resize(std::min(all.size() - 1, lines));
+  all.push_back(status);
+  return all;
+}
 
 // A copy of a golden package with its libraries beside it, for a test to spoil.
 class Reason : public testing::Test {
@@ -50,7 +74,7 @@ class Reason : public testing::Test {
              const Lines& before = {}) const {
     Lines words = options;
     words.push_back(file);
-    return FirstLines(lines, words, {before, folder_.path()});
+    return WithoutReason(lines, FirstLines(kAll, words, {before, folder_.path()}));
   }
 
   const TempDir folder_;
@@ -58,7 +82,7 @@ class Reason : public testing::Test {
 
 TEST_F(Reason, Unsigned) {
   Take("unsigned.apk");
-  EXPECT_EQ(Told(3), Lines({std::string("REFUSED  base.apk") + kVault,
+  EXPECT_EQ(Told(3), Lines({"REFUSED  base.apk",
                             "  ✗ package                not signed: it is unsigned: "
                             "META-INF/MANIFEST.MF is missing",
                             "      Sign it: apksigner sign --v1-signing-enabled true.", "-> 1"}));
@@ -68,7 +92,7 @@ TEST_F(Reason, NewerSchemeOnly) {
   Take("apksigner-newer-only");
   EXPECT_EQ(
       Told(4),
-      Lines({std::string("REFUSED  base.apk") + kVault,
+      Lines({"REFUSED  base.apk",
              "  ✗ package                not signed: it is signed with v2, v3 alone, and "
              "this tool reads JAR signatures (v1): META-INF/MANIFEST.MF is missing",
              "      Sign it with v1 as well: enableV1Signing true for the Gradle plugin, or",
@@ -77,8 +101,9 @@ TEST_F(Reason, NewerSchemeOnly) {
 
 TEST_F(Reason, SignedByJarsigner) {
   for (const char* name : {"jarsigner-sha256", "jarsigner-sha1"}) {
-    const Lines told = FirstLines(3, {"base.apk"}, {{}, std::string(GOLDEN_PACKAGES) + "/" + name});
-    EXPECT_EQ(told, Lines({"REFUSED  base.apk" + ByRsa2048(),
+    const std::string folder = std::string(GOLDEN_PACKAGES) + "/" + name;
+    const Lines told = WithoutReason(3, FirstLines(kAll, {"base.apk"}, {{}, folder}));
+    EXPECT_EQ(told, Lines({"REFUSED  base.apk",
                            "  ✗ package                not signed: its signature covers signed "
                            "attributes, as jarsigner writes them, and this tool does not read "
                            "those",
@@ -89,7 +114,7 @@ TEST_F(Reason, SignedByJarsigner) {
 TEST_F(Reason, CertificateThatAnAuthorityIssued) {
   Take("openssl-cms-issued");
   EXPECT_EQ(Told(4),
-            Lines({"REFUSED  base.apk" + By("rsa-2048-other", "RSA-2048, key 03e5e653…57c52a"),
+            Lines({"REFUSED  base.apk",
                    "  ✗ package                not signed: its certificate was issued by "
                    "another (CN=rsa-2048, O=Example), and this tool takes self-signed "
                    "ones alone",
@@ -99,7 +124,7 @@ TEST_F(Reason, CertificateThatAnAuthorityIssued) {
 
 TEST_F(Reason, EcKey) {
   Take("apksigner-ec");
-  EXPECT_EQ(Told(3), Lines({"REFUSED  base.apk" + By("ec-p256", "EC-256"),
+  EXPECT_EQ(Told(3), Lines({"REFUSED  base.apk",
                             "  ✗ package                not signed: its key is an EC key, and this "
                             "tool knows RSA alone",
                             "      Sign it with an RSA key of 2048 to 4096 bits.", "-> 1"}));
@@ -107,7 +132,7 @@ TEST_F(Reason, EcKey) {
 
 TEST_F(Reason, KeyOfMoreThan4096Bits) {
   Take("apksigner-5120");
-  EXPECT_EQ(Told(3), Lines({"REFUSED  base.apk" + By("rsa-5120", "RSA-5120, key 255bfb8f…6e1f99"),
+  EXPECT_EQ(Told(3), Lines({"REFUSED  base.apk",
                             "  ✗ package                not signed: its RSA key has 5120 bits, and "
                             "this tool takes at most 4096",
                             "      Sign it with an RSA key of 2048 to 4096 bits.", "-> 1"}));
@@ -200,7 +225,7 @@ TEST_F(Reason, IntegrityValueZero) {
   Take("apksigner-sha256-2048");
   EXPECT_EQ(
       Told(8, {"--integrity", "0"}),
-      Lines({"REFUSED  base.apk" + ByRsa2048(),
+      Lines({"REFUSED  base.apk",
              "  ✗ package                not signed: the tool's own integrity value settled "
              "at 0, so that it may not sign",
              "  ✗ lib/arm64/libvault.so  not signed: the tool's own integrity value settled "
@@ -259,7 +284,7 @@ TEST_F(Reason, TamperedLibrary) {
   Take("apksigner-sha256-2048");
   Do("echo >>lib/arm64/libvault.so");
   EXPECT_EQ(Told(7),
-            Lines({"PARTLY SIGNED  base.apk" + ByRsa2048(), kSigned,
+            Lines({"PARTLY SIGNED  base.apk", kSigned,
                    "  ✗ lib/arm64/libvault.so  not signed: its bytes are not those that the "
                    "manifest lists",
                    "      The file beside the package was changed after it was installed. Install",
@@ -270,7 +295,7 @@ TEST_F(Reason, TamperedLibrary) {
 TEST_F(Reason, TamperedDexFile) {
   Take("changed-dex");
   EXPECT_EQ(Told(7),
-            Lines({"REFUSED  base.apk" + ByRsa2048(),
+            Lines({"REFUSED  base.apk",
                    "  ✗ package                not signed: classes.dex is not the one that was "
                    "signed",
                    "      Sign the package again, as the last step that changes it. If nobody",
@@ -285,7 +310,7 @@ TEST_F(Reason, TamperedManifest) {
   Do("unzip -q base.apk META-INF/MANIFEST.MF; echo >>META-INF/MANIFEST.MF;"
      " zip -q base.apk META-INF/MANIFEST.MF");
   EXPECT_EQ(Told(3),
-            Lines({"REFUSED  base.apk" + ByRsa2048(),
+            Lines({"REFUSED  base.apk",
                    "  ✗ package                not signed: META-INF/MANIFEST.MF was changed after "
                    "it was signed",
                    "      Sign the package again, as the last step that changes it.", "-> 1"}));
@@ -325,7 +350,7 @@ TEST_F(Reason, LibrariesThatDoNotLieBesideThePackage) {
                    "      Nothing, where the phone is of another kind. For a package that lies",
                    "      alone: --install; for all processors: --install=all.",
                    "  ✓ key                    registered for com.example.vault", "-> 0"}));
-  EXPECT_EQ(Told(1, {"--strict"}), Lines({"PARTLY SIGNED  base.apk" + ByRsa2048(), "-> 1"}));
+  EXPECT_EQ(Told(1, {"--strict"}), Lines({"PARTLY SIGNED  base.apk", "-> 1"}));
   EXPECT_EQ(Told(5, {"--install=all"}),
             Lines({"SIGNED  base.apk" + ByRsa2048(), kSigned, "  ✓ lib/arm64/libvault.so  signed",
                    "  ✓ lib/arm/libvault.so    signed",

@@ -185,9 +185,10 @@ TEST(Page, ListsTheFilesWhereThereAreSeveral) {
   EXPECT_FALSE(Has(PageOf(Example(Verdict::kSigned)), "<nav"));
   const std::string page = PageOf({Example(Verdict::kRefused), Example(Verdict::kTrustedJar)});
   EXPECT_TRUE(Has(page, "<p>2 files: 1 trusted JAR, 1 refused</p>"));
-  EXPECT_TRUE(Has(page,
-                  "<li><span class=\"verdict good\">TRUSTED JAR</span> "
-                  "<a class=\"name\" href=\"#file-2\">base.apk</a></li>"));
+  EXPECT_TRUE(
+      Has(page,
+          "<li><span class=\"verdict good\">TRUSTED JAR</span> "
+          "<a class=\"name\" href=\"#file-2\">base.apk</a> <span class=\"fact\"></span></li>"));
   EXPECT_TRUE(Has(page, "<article id=\"file-2\""));
 }
 
@@ -258,4 +259,19 @@ TEST(Page, ShowsTheKeyBehindALongName) {
   report.signer->subject = std::string(1000, 'n');
   report.key = {std::string(64, '1'), 2048, true};
   EXPECT_TRUE(Has(PageOf(report), "n…, RSA-2048, key 11111111…111111</p>"));
+}
+
+TEST(Page, TableOfFilesSaysWhyAndWhose) {
+  Report refused = Example(Verdict::kPartlySigned);
+  refused.package_name = "com.app";
+  refused.items = {Library("lib/arm/a.so", &cause::kLibraryMissing)};
+  refused.warnings = {{&cause::kSchemesStripped, "v2"}};
+  Report good = Example(Verdict::kSigned);
+  good.package_name = "com.app";
+  const std::string page = PageOf({refused, good});
+  EXPECT_TRUE(
+      Has(page,
+          "href=\"#file-1\">base.apk</a> <span class=\"fact\">lib/arm/a.so: it does not lie "
+          "beside the package, where others are · 1 warning</span></li>"));
+  EXPECT_TRUE(Has(page, "href=\"#file-2\">base.apk</a> <span class=\"fact\">com.app</span></li>"));
 }
