@@ -6,6 +6,7 @@
 
 #include <algorithm>
 #include <cerrno>
+#include <unordered_set>
 
 #include "apk/apk.h"
 #include "apk/native_libraries.h"
@@ -23,6 +24,7 @@ constexpr int kOpenFlags = O_RDONLY | O_CLOEXEC | O_NONBLOCK | O_NOCTTY;
 FileKind KindOf(int fd, uint64_t size);
 bool IsText(const std::string& start);
 void ReadArchive(int fd, const IsLate& is_late, PackageFacts* facts);
+std::string FindEntryTwice(int fd);
 void FindLibraries(const Archive& archive, const std::string& path, PackageFacts* facts);
 LibraryFacts FindLibrary(const std::string& entry, const std::string& path);
 void ReadNewerSigners(int fd, PackageFacts* facts);
@@ -82,7 +84,10 @@ bool IsText(const std::string& start) {
 
 void ReadArchive(int fd, const IsLate& is_late, PackageFacts* facts) {
   Archive archive(fd, &facts->archive_result);
-  if (facts->archive_result != 0) return;
+  if (facts->archive_result != 0) {
+    facts->entry_twice = FindEntryTwice(fd);
+    return;
+  }
   std::vector<uint8_t> manifest;
   archive.Read(kAndroidManifestName, &manifest);
   facts->manifest = ParseAndroidManifest(manifest);
@@ -97,6 +102,16 @@ void ReadArchive(int fd, const IsLate& is_late, PackageFacts* facts) {
   if (facts->manifest.has_overlaps) facts->too_long.push_back(kAndroidManifestName);
   ReadNewerSigners(fd, facts);
   facts->was_changed = archive.HasShrunk();
+}
+
+// The platform's library opens no archive that has one.
+std::string FindEntryTwice(int fd) {
+  const auto end = FindArchiveEnd(fd);
+  std::unordered_set<std::string> names;
+  for (const ArchiveEntry& entry : end ? ReadDirectory(fd, *end) : std::vector<ArchiveEntry>()) {
+    if (!names.insert(entry.name).second) return entry.name;
+  }
+  return {};
 }
 
 // The tool's walk names all but the damaged ones.

@@ -53,6 +53,8 @@ struct PackageFacts {
   // The zip library's; 0: it is an archive, and what follows is filled.
   int32_t archive_result = -1;
 
+  std::string entry_twice;  // the first entry that stands in it again; empty: none does
+
   AndroidManifest manifest;
   JarSignatureFacts jar;
   std::vector<NewerSignerFacts> newer;

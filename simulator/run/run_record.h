@@ -78,6 +78,7 @@ struct RunRecord {
   bool has_standard_input = true;  // the tool was started with one
   // The library entries that --install does not take for their names, and those that it could not
   // extract.
+  bool was_laid_out = false;  // --install was given
   std::vector<std::string> not_laid_out;
   std::vector<std::string> not_extracted;
 };

@@ -95,6 +95,7 @@ FileRun Simulator::Run(const std::string& file) {
   RememberSigned(run.record.events, &task);
   run.record.failure = task.failure;
   run.record.has_standard_input = has_standard_input_;
+  run.record.was_laid_out = options_.abi.has_value();
   run.record.not_laid_out = installation.left_out();
   run.record.not_extracted = installation.not_extracted();
   // What cannot be judged is not looked at.

@@ -116,6 +116,23 @@ inline constexpr Cause kDamagedArchive = {"damaged-archive", Group::kFile, Sever
     ChainLink::kEntries, "`OpenArchiveFd(`",
     "it is a damaged archive, which the zip library does not open",
     "Copy or download it again. unzip -t, and the ziparchive lines of the log, name the fault."};
+inline constexpr Cause kEntryTwice = {"entry-twice", Group::kFile, Severity::kRefused,
+    ChainLink::kEntries, "`OpenArchiveFd(`",
+    "%s stands in it more than once, and the zip library does not open that",
+    "Build the package again, with one entry of each name. If it is not of your making: do not "
+    "trust it."};
+inline constexpr Cause kAppBundle = {"app-bundle", Group::kFile, Severity::kRefused,
+    ChainLink::kKey, "`VELT can't verify a file`",
+    "it is an app bundle (.aab), which no phone installs",
+    "Make packages of it with bundletool build-apks, and name those."};
+inline constexpr Cause kPackageSet = {"package-set", Group::kFile, Severity::kRefused,
+    ChainLink::kKey, "`VELT can't verify a file`",
+    "it is an archive of packages (.apks, .xapk), and no package itself",
+    "Unpack it, and name the packages in it, the base and its splits."};
+inline constexpr Cause kPackageWithoutManifest = {"package-without-manifest", Group::kFile,
+    Severity::kRefused, ChainLink::kKey, "`VELT can't verify a file`", "it has parts of a package "
+    "(%s) and no AndroidManifest.xml, so it counts as a plain JAR, which the kernel does not trust",
+    "Build the package again with aapt or aapt2, which put AndroidManifest.xml in it."};
 inline constexpr Cause kJarNotTrusted = {"jar-not-trusted", Group::kFile, Severity::kRefused,
     ChainLink::kKey, "`VELT can't verify a file`",
     "it is a plain JAR, and those are signed only when the kernel trusts them already (%s)",
@@ -160,19 +177,27 @@ inline constexpr Cause kSignatureBlockMalformed = {"signature-block-malformed", 
 inline constexpr Cause kEcKey = {"ec-key", Group::kSignature, Severity::kRefused, ChainLink::kKey,
     "`Can't extract RSA certificate`, `Unknown certificate type`",
     "its key is an EC key, and this tool knows RSA alone",
-    "Sign it with an RSA key of 2048 to 4096 bits."};
+    "Sign it with an RSA key of 2048 to 4096 bits. That is another "
+    "signer: phones refuse it as an update of a published app. Rotation does not help: the JAR "
+    "signature stays the first key's."};
 inline constexpr Cause kDsaKey = {"dsa-key", Group::kSignature, Severity::kRefused, ChainLink::kKey,
     "`Can't extract RSA certificate`, `Unknown certificate type`",
     "its key is a DSA key, and this tool knows RSA alone",
-    "Sign it with an RSA key of 2048 to 4096 bits."};
+    "Sign it with an RSA key of 2048 to 4096 bits. That is another "
+    "signer: phones refuse it as an update of a published app. Rotation does not help: the JAR "
+    "signature stays the first key's."};
 inline constexpr Cause kKeyTooLarge = {"key-too-large", Group::kSignature, Severity::kRefused,
     ChainLink::kKey, "`RSA could not verify certificate`",
     "its RSA key has %s bits, and this tool takes at most 4096",
-    "Sign it with an RSA key of 2048 to 4096 bits."};
+    "Sign it with an RSA key of 2048 to 4096 bits. That is another "
+    "signer: phones refuse it as an update of a published app. Rotation does not help: the JAR "
+    "signature stays the first key's."};
 inline constexpr Cause kKeyTooSmall = {"key-too-small", Group::kSignature, Severity::kRefused,
     ChainLink::kKey, "`RSA could not verify certificate`",
     "its RSA key has %s bits, and this tool takes no fewer than 128",
-    "Sign it with an RSA key of 2048 to 4096 bits."};
+    "Sign it with an RSA key of 2048 to 4096 bits. That is another "
+    "signer: phones refuse it as an update of a published app. Rotation does not help: the JAR "
+    "signature stays the first key's."};
 inline constexpr Cause kExponentRefused = {"exponent-refused", Group::kSignature,
     Severity::kRefused, ChainLink::kKey, "`RSA could not set key`",
     "its RSA key has the public exponent %s, with which anyone can make its signatures",
@@ -181,13 +206,14 @@ inline constexpr Cause kCertificateIssued = {"certificate-issued", Group::kSigna
     Severity::kRefused, ChainLink::kCertificate, "`RSA could not verify certificate`",
     "its certificate was issued by another (%s), and this tool takes self-signed ones alone",
     "Sign it with a self-signed certificate: keytool -genkeypair -keyalg RSA -sigalg "
-    "SHA256withRSA."};
+    "SHA256withRSA. That is another signer: phones refuse it as an update of a published app."};
 inline constexpr Cause kCertificateDigest = {"certificate-digest", Group::kSignature,
     Severity::kRefused, ChainLink::kCertificate, "`RSA could not verify certificate`",
     "its certificate is signed with %s, and this tool reads MD5, SHA-1 and SHA-256 with RSA",
-    "Make a certificate for the same key with SHA-256: keytool -selfcert -sigalg SHA256withRSA. "
-    "Without -sigalg keytool takes SHA-384: that of JDK 21 for every RSA key, that of JDK 17 for "
-    "keys of more than 3072 bits."};
+    "Certify the same key with SHA-256, and sign again: keytool -selfcert -alias ALIAS -sigalg "
+    "SHA256withRSA -validity 10000 -keystore KEYSTORE. That is another signer: phones refuse it as "
+    "an update of a published app. Without -sigalg keytool takes SHA-384: that of JDK 21 for every "
+    "RSA key, that of JDK 17 for keys of more than 3072 bits."};
 inline constexpr Cause kCertificateChanged = {"certificate-changed", Group::kSignature,
     Severity::kRefused, ChainLink::kCertificate, "`RSA could not verify certificate`",
     "its certificate does not carry a signature by its own key",
@@ -290,6 +316,14 @@ inline constexpr Cause kLibraryNotInstalled = {"library-not-installed", Group::k
     Severity::kAbsent, ChainLink::kNone, "`Can't open file`",
     "no libraries for its processor lie beside the package", "Nothing, where the phone is of "
     "another kind. For a package that lies alone: --install; for all processors: --install=all."};
+inline constexpr Cause kLibraryNotLaidOut = {"library-not-laid-out", Group::kLibrary,
+    Severity::kAbsent, ChainLink::kNone, "`Can't open file`",
+    "--install lays out no libraries for its processor",
+    "Nothing, where the phone is of another kind. For all processors: --install=all."};
+inline constexpr Cause kLibraryInSubdirectory = {"library-in-subdirectory", Group::kLibrary,
+    Severity::kAbsent, ChainLink::kNone, "`Can't open file`",
+    "it is in a subdirectory of its ABI: the tool looks for %s, and installers do not put it there",
+    "Build the package again with its libraries as lib/ABI/NAME."};
 inline constexpr Cause kLibraryMissing = {"library-missing", Group::kLibrary, Severity::kAbsent,
     ChainLink::kNone, "`Can't open file`", "it does not lie beside the package, where others are",
     "Install the package again, unless the installer leaves it out on purpose."};
@@ -373,6 +407,12 @@ inline constexpr Cause kEntriesNotCompared = {"entries-not-compared", Group::kWa
     Severity::kAlarm, ChainLink::kNone, "", "%s not compared with the manifest: too long, of "
     "another digest than SHA-1 and SHA-256, or the time was up",
     "Run it again with a larger --timeout. Entries above 512 MiB are not compared."};
+inline constexpr Cause kWeakKey = {"weak-key", Group::kWarning, Severity::kWarning,
+    ChainLink::kNone, "", "its RSA key has %s bits, and 2048 are the least that is safe",
+    "Sign a new app with a key of 2048 bits or more. For a published one that is another signer."};
+inline constexpr Cause kDebugKey = {"debug-key", Group::kWarning, Severity::kWarning,
+    ChainLink::kNone, "", "it is signed with a debug certificate (CN=Android Debug), of which each "
+    "workstation makes its own", "Sign a release with a key of its own."};
 inline constexpr Cause kUnlistedEntries = {"unlisted-entries", Group::kWarning, Severity::kWarning,
     ChainLink::kNone, "", "the signature does not protect %s: no digest in the manifest",
     "Sign the package again, as the last step that changes it; --verbose lists them."};
@@ -397,6 +437,9 @@ inline constexpr Cause kFileChanged = {"file-changed", Group::kWarning, Severity
 inline constexpr Cause kNotLookedInto = {"not-looked-into", Group::kWarning, Severity::kAlarm,
     ChainLink::kNone, "", "%s is too large to be looked into, and nothing is told of it",
     "Do not trust this package, if it is not of your making: those of real packages are small."};
+inline constexpr Cause kEntriesEncrypted = {"entries-encrypted", Group::kWarning, Severity::kDoubt,
+    ChainLink::kNone, "", "%s: encrypted, and no phone decrypts it",
+    "Build the package again without a password."};
 inline constexpr Cause kEntriesDamaged = {"entries-damaged", Group::kWarning, Severity::kDoubt,
     ChainLink::kNone, "", "the archive is damaged at %s, which nobody can read",
     "Copy or build the package again; unzip -t names the fault."};

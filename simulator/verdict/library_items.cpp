@@ -18,8 +18,8 @@ struct Library {
 std::vector<Library> MatchAttempts(const RunRecord& run, const std::vector<LibraryFacts>& present);
 Reason WhyNotSigned(const Library& library, const RunRecord& run, const PackageFacts& facts,
                     bool is_walked);
-Reason WhyNotVerified(const Library& library, const PackageFacts& facts);
-Reason WhyNotThere(const LibraryFacts& library, const PackageFacts& facts);
+Reason WhyNotVerified(const Library& library, const RunRecord& run, const PackageFacts& facts);
+Reason WhyNotThere(const LibraryFacts& library, const RunRecord& run, const PackageFacts& facts);
 
 }  // namespace
 
@@ -92,7 +92,8 @@ Reason WhyNotSigned(const Library& library, const RunRecord& run, const PackageF
   }
   if (library.attempt != nullptr) {
     const Attempt& attempt = *library.attempt;
-    if (attempt.outcome == Attempt::Outcome::kNotVerified) return WhyNotVerified(library, facts);
+    if (attempt.outcome == Attempt::Outcome::kNotVerified)
+      return WhyNotVerified(library, run, facts);
     if (attempt.outcome == Attempt::Outcome::kVanished) {
       return {&cause::kLibraryNotOpened, DescribeErrno(attempt.error)};
     }
@@ -101,13 +102,13 @@ Reason WhyNotSigned(const Library& library, const RunRecord& run, const PackageF
   if (found.place.empty()) return {&cause::kLibraryOtherAbi, ""};
   if (!is_walked) return {&cause::kPackageRefused, ""};
   if (found.is_met) return {&cause::kNotReached, ""};
-  if (found.error != 0) return WhyNotThere(found, facts);
+  if (found.error != 0) return WhyNotThere(found, run, facts);
   return {&cause::kLibraryBehindDamage, ""};
 }
 
-Reason WhyNotVerified(const Library& library, const PackageFacts& facts) {
+Reason WhyNotVerified(const Library& library, const RunRecord& run, const PackageFacts& facts) {
   const LogMeaning why = library.attempt->why;
-  if (why == LogMeaning::kFileNotOpened) return WhyNotThere(library.facts, facts);
+  if (why == LogMeaning::kFileNotOpened) return WhyNotThere(library.facts, run, facts);
   if (why == LogMeaning::kFileNotRead) return {&cause::kLibraryNoFile, ""};
   if (why == LogMeaning::kNotListed) return {&cause::kLibraryNotListed, ""};
   if (why == LogMeaning::kDigestUnknown) return {&cause::kLibraryDigest, ""};
@@ -120,7 +121,7 @@ Reason WhyNotVerified(const Library& library, const PackageFacts& facts) {
 }
 
 // The tool does not log why a file does not open; the file system still knew.
-Reason WhyNotThere(const LibraryFacts& library, const PackageFacts& facts) {
+Reason WhyNotThere(const LibraryFacts& library, const RunRecord& run, const PackageFacts& facts) {
   const int error = library.error;
   if (error == EACCES || error == EPERM) return {&cause::kLibraryNoPermission, ""};
   if (error == EWOULDBLOCK) return {&cause::kLibraryLeased, ""};
@@ -129,7 +130,12 @@ Reason WhyNotThere(const LibraryFacts& library, const PackageFacts& facts) {
     return {&cause::kLibraryNotOpened, DescribeErrno(error)};
   }
   if (facts.manifest.extracts_libraries == false) return {&cause::kLibraryInPackage, ""};
-  return {library.has_directory ? &cause::kLibraryMissing : &cause::kLibraryNotInstalled, ""};
+  // lib/arm64/NAME is where an installer puts it.
+  if (std::count(library.place.begin(), library.place.end(), '/') > 2) {
+    return {&cause::kLibraryInSubdirectory, library.place};
+  }
+  if (library.has_directory) return {&cause::kLibraryMissing, ""};
+  return {run.was_laid_out ? &cause::kLibraryNotLaidOut : &cause::kLibraryNotInstalled, ""};
 }
 
 }  // namespace

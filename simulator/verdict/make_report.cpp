@@ -14,7 +14,7 @@ namespace {
 
 Item OwnItem(const RunRecord& run, const PackageFacts& facts, const JudgeOptions& options);
 ItemKind KindOf(const RunRecord& run);
-Reason WhyJarRefused(const RunRecord& run);
+Reason WhyJarRefused(const RunRecord& run, const PackageFacts& facts);
 Reason WhyFailed(const Failure& failure);
 void AddKeyItems(const RunRecord& run, const JudgeOptions& options, std::vector<Item>* items);
 void AddToolItems(const RunRecord& run, const JudgeOptions& options, std::vector<Item>* items);
@@ -108,13 +108,13 @@ Item OwnItem(const RunRecord& run, const PackageFacts& facts, const JudgeOptions
   const char* const name = kNames[static_cast<size_t>(kind)];
   Reason reason;
   if (run.verify_error.value_or(0) != 0) {
-    reason = WhyJarRefused(run);
+    reason = WhyJarRefused(run, facts);
   } else if (run.own) {
     reason = WhyKernelDidNotSign(*run.own);
   } else if (run.signal) {
     reason = {&cause::kNotReached, ""};
   } else {
-    reason = run.is_jar ? WhyJarRefused(run) : WhyRefused(run, facts);
+    reason = run.is_jar ? WhyJarRefused(run, facts) : WhyRefused(run, facts);
   }
   Item item = {kind, name, "", ItemState::kDone, {}};
   if (reason.cause != nullptr) item = NotDone(kind, name, reason, options);
@@ -131,11 +131,13 @@ ItemKind KindOf(const RunRecord& run) {
   return is_archive ? ItemKind::kPackage : ItemKind::kFile;
 }
 
-Reason WhyJarRefused(const RunRecord& run) {
+Reason WhyJarRefused(const RunRecord& run, const PackageFacts& facts) {
   const LogLine* const line = FindError(run.opening_errors, LogMeaning::kNoAndroidManifest);
   if (line != nullptr && line->text != ErrorCodeString(ApkTools::kZipEntryNotFound)) {
     return {&cause::kAndroidManifestDamaged, ""};
   }
+  const Reason taken_for_a_jar = WhyTakenForAJar(facts);
+  if (taken_for_a_jar.cause != nullptr) return taken_for_a_jar;
   return {&cause::kJarNotTrusted, DescribeErrno(run.verify_error.value_or(0))};
 }
 

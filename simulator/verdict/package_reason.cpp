@@ -63,6 +63,22 @@ Reason WhyNotLookedAt(const PackageFacts& facts, bool has_standard_input) {
   return {};
 }
 
+// JARs of the platform have a classes.dex as well, but neither resources nor libraries.
+Reason WhyTakenForAJar(const PackageFacts& facts) {
+  std::string part;
+  bool has_packages = false;
+  for (const ListedEntry& each : facts.entries) {
+    const std::string& name = each.entry.name;
+    if (name == "BundleConfig.pb") return {&cause::kAppBundle, ""};
+    has_packages = has_packages || EndsWith(name, ".apk");
+    const bool is_part = name == "resources.arsc" || kLibraryNames.Has(name);
+    if (is_part && part.empty()) part = name;
+  }
+  if (has_packages) return {&cause::kPackageSet, ""};
+  if (!part.empty()) return {&cause::kPackageWithoutManifest, part};
+  return {};
+}
+
 namespace {
 
 Reason WhyDexRefused(LogMeaning why) {
@@ -78,6 +94,7 @@ Reason WhyNotOpened(const PackageFacts& facts, int64_t code) {
       &cause::kTextFile, &cause::kCutArchive, &cause::kNoArchive,   nullptr};
   const Cause* const why = kCauses[static_cast<size_t>(facts.kind)];
   if (why != nullptr) return {why, ""};
+  if (!facts.entry_twice.empty()) return {&cause::kEntryTwice, facts.entry_twice};
   return {code == kNoEntries ? &cause::kEmptyArchive : &cause::kDamagedArchive, ""};
 }
 

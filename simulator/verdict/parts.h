@@ -16,6 +16,10 @@ Reason WhyRefused(const RunRecord& run, const PackageFacts& facts);
 // For a file that the tool did not look at; a null cause when it had no reason not to.
 Reason WhyNotLookedAt(const PackageFacts& facts, bool has_standard_input);
 
+// What an archive without AndroidManifest.xml is, where it was hardly meant for a JAR; a null cause
+// for what may be one.
+Reason WhyTakenForAJar(const PackageFacts& facts);
+
 // Why the kernel did not sign the file; a null cause when it did.
 Reason WhyKernelDidNotSign(const Attempt& attempt);
 

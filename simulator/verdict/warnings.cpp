@@ -74,6 +74,14 @@ void WarnOfSigners(const PackageFacts& facts, const Report& report, Reasons* war
   if (!is_said && jar.key && jar.key->is_forgeable) {
     warnings->push_back({&cause::kForgeableKey, std::to_string(jar.key->exponent)});
   }
+  constexpr int kSafeBits = 2048;
+  if (jar.key && jar.key->bits < kSafeBits) {
+    warnings->push_back({&cause::kWeakKey, std::to_string(jar.key->bits)});
+  }
+  const std::string subject = jar.certificate ? jar.certificate->subject : "";
+  if ((subject + ",").find("CN=Android Debug,") != std::string::npos) {
+    warnings->push_back({&cause::kDebugKey, ""});
+  }
   if (jar.signature_files.size() > 1 || jar.block.signer_count > 1) {
     warnings->push_back({&cause::kSeveralSigners, jar.signature_files[0]});
   }
@@ -111,10 +119,15 @@ void WarnOfEntries(const PackageFacts& facts, const Report& report, Reasons* war
   const bool has_list = facts.jar.manifest == Archive::ReadResult::kRead;
   uint64_t unlisted = 0;
   uint64_t bytes = 0;
-  std::vector<std::string> damaged, changed, uncompared;
+  std::vector<std::string> damaged, encrypted, changed, uncompared;
   for (const ListedEntry& each : facts.entries) {
-    if (each.entry.is_damaged) damaged.push_back(each.entry.name);
-    const bool is_lost = each.digest == EntryDigest::kNotCompared && !each.entry.is_damaged;
+    if (each.entry.is_encrypted) {
+      encrypted.push_back(each.entry.name);
+    } else if (each.entry.is_damaged) {
+      damaged.push_back(each.entry.name);
+    }
+    const bool is_lost = each.digest == EntryDigest::kNotCompared && !each.entry.is_damaged &&
+                         !each.entry.is_encrypted;
     if (is_lost) uncompared.push_back(each.entry.name);
     if (each.digest == EntryDigest::kDiffers && !IsSaid(each.entry.name, report)) {
       changed.push_back(each.entry.name);
@@ -123,6 +136,7 @@ void WarnOfEntries(const PackageFacts& facts, const Report& report, Reasons* war
     ++unlisted;
     bytes += each.entry.size;
   }
+  if (!encrypted.empty()) warnings->push_back({&cause::kEntriesEncrypted, CountedNames(encrypted)});
   if (!damaged.empty()) warnings->push_back({&cause::kEntriesDamaged, CountedNames(damaged)});
   if (!changed.empty()) warnings->push_back({&cause::kEntriesChanged, CountedNames(changed)});
   if (!facts.missing.empty()) {

@@ -263,3 +263,29 @@ TEST(Warnings, WhatAnItemSaysIsNotSaidTwice) {
                           {&cause::kLibraryChangedInside, ""}});
   EXPECT_EQ(Warnings(facts, report), Lines({"entries-damaged: 1 entry: damaged"}));
 }
+
+// ---- Keys that nobody should sign a release with.
+
+TEST(Warnings, KeyThatIsTooShort) {
+  PackageFacts facts = Good();
+  facts.jar.key->bits = 2047;
+  EXPECT_EQ(Warnings(facts), Lines({"weak-key: 2047"}));
+  facts.jar.key->bits = 2048;
+  EXPECT_EQ(Warnings(facts), Lines());
+}
+
+TEST(Warnings, DebugCertificate) {
+  PackageFacts facts = Good();
+  facts.jar.certificate->subject = "C=US, O=Android, CN=Android Debug";
+  EXPECT_EQ(Warnings(facts), Lines({"debug-key: "}));
+  facts.jar.certificate->subject = "CN=Android Debug, O=Android";
+  EXPECT_EQ(Warnings(facts), Lines({"debug-key: "}));
+  facts.jar.certificate->subject = "CN=Android Debugger";
+  EXPECT_EQ(Warnings(facts), Lines());
+}
+
+TEST(Warnings, EncryptedEntriesAreNotCalledDamaged) {
+  PackageFacts facts = Good();
+  facts.entries = {{{"secret", 1, true, true}, true, false, EntryDigest::kNotCompared}};
+  EXPECT_EQ(Warnings(facts), Lines({"entries-encrypted: 1 entry: secret"}));
+}
