@@ -82,6 +82,14 @@ long ReadAndClose(FILE* file) {
   return is_read ? static_cast<long>(value) : -2;
 }
 
+// How many bytes there are in it.
+long CountAndClose(FILE* file) {
+  char bytes[64];
+  const size_t count = fread(bytes, 1, sizeof(bytes), file);
+  fclose(file);
+  return static_cast<long>(count);
+}
+
 // Writes to what was opened for reading.
 long WriteAndClose(FILE* file) {
   const long result = write(fileno(file), "2e", 2);
@@ -127,6 +135,7 @@ const std::map<std::string, Command> kCommands = {
     {"close", [](const Words& w) { return close(Int(w[1])); }},
     {"fopen", [](const Words& w) { return ReadAndClose(fopen(w[1].c_str(), w[2].c_str())); }},
     {"fopen64", [](const Words& w) { return ReadAndClose(fopen64(w[1].c_str(), w[2].c_str())); }},
+    {"bytes", [](const Words& w) { return CountAndClose(fopen(w[1].c_str(), "r")); }},
     {"keep", [](const Words& w) { return fileno(fopen(w[1].c_str(), "r")); }},
     {"write", [](const Words& w) { return WriteAndClose(fopen(w[1].c_str(), "r")); }},
     {"own-task",
