@@ -30,7 +30,7 @@ namespace {
 // Writes a record as the platform's C++ libraries do.
 template <typename Data = __android_logger_data, typename Message = __android_log_message>
 void WriteLogRecord(int priority, const char* tag, const char* text) {
-  if constexpr (kLogLibraryHas<Message>) {
+  if constexpr (simulator::kLogLibraryHas<Message>) {
     Message message = {sizeof(message), LOG_ID_MAIN, priority, tag, nullptr, 0, text};
     __android_log_write_log_message(&message);
   } else {
