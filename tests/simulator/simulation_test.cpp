@@ -115,6 +115,17 @@ TEST(Interruption, EndsTheToolAndTheSimulatorByTheSignal) {
   }
 }
 
+// As of what nohup starts.
+TEST(Interruption, IsNoneByASignalThatTheCallerIgnores) {
+  const Probe slow({"sign 3 0000", "pid", "sleep 1"});
+  const ProcessResult result = RunProcess(
+      {"bash", "-c",
+       "trap '' HUP; \"$@\" & while [ ! -s \"$0\" ]; do sleep 0.02; done; kill -HUP $!; wait $!",
+       slow.path() + ".pid", SimulatorPath(), "--quiet", "--tool", PROBE_PATH, slow.path()});
+  EXPECT_EQ(result.output, "TRUSTED JAR  " + slow.path() + "\n");
+  EXPECT_EQ(result.status, 0);
+}
+
 // Names may come from whoever made the files.
 TEST(Files, NamesReachNoTerminalAsTheyAre) {
   const TempDir folder;

@@ -171,6 +171,7 @@ const std::map<std::string, Command> kCommands = {
     {"pid", WriteId},
     {"has-variable", [](const Words& w) { return getenv(w[1].c_str()) == nullptr ? 0L : 1L; }},
     {"exit", [](const Words& w) -> long { _exit(Int(w[1])); }},
+    {"ignore", [](const Words& w) { return signal(Int(w[1]), SIG_IGN) == SIG_ERR ? -1L : 0L; }},
     {"kill", [](const Words& w) { return raise(Int(w[1])); }},
     {"sleep", [](const Words& w) { return sleep(static_cast<unsigned>(Int(w[1]))); }},
 };

@@ -145,6 +145,8 @@ TEST(MakeReport, LibraryWithOtherBytesIsRefused) {
   EXPECT_EQ(report.verdict, Verdict::kPartlySigned);
   EXPECT_EQ(ItemsOf(report),
             Lines({"package done", "lib/arm64/libfoo.so refused library-changed"}));
+  EXPECT_TRUE(report.items[0].is_verified);
+  EXPECT_FALSE(report.items[1].is_verified);
 }
 
 // The library's item where this is logged of it, and opening it ends like this.
@@ -287,6 +289,16 @@ TEST(MakeReport, LibrariesThatTheKernelWasNotAskedForAreKnownByTheirOrder) {
   EXPECT_EQ(report.verdict, Verdict::kPartlySigned);
   EXPECT_EQ(ItemsOf(report), Lines({"package refused integrity-missing", "lib/arm64/liba.so done",
                                     "lib/arm64/libb.so refused integrity-zero"}));
+}
+
+TEST(MakeReport, LibrariesBehindTheToolsEndAreNotReached) {
+  const Report report = Made({kLibrariesStart, kTakesUp, Integrity("1f"),
+                              Sign("/data/app/lib/arm64/liba.so", kPackagePayload)},
+                             WithLibraries({"lib/arm64-v8a/liba.so", "lib/arm64-v8a/libb.so"}), {},
+                             {{"event", "exit"}, {"signal", 9}});
+  EXPECT_EQ(ItemsOf(report),
+            Lines({"package refused not-reached", "lib/arm64/liba.so done",
+                   "lib/arm64/libb.so refused not-reached", "tool refused tool-killed 9"}));
 }
 
 TEST(MakeReport, IntegrityValuesAreReadAsTheToolReadsThem) {
