@@ -19,6 +19,7 @@ WORKSTATION_ONLY = {
     "tests/crypto/rsa_test.cpp": "compares with GMP",
     "tests/crypto/x509_authorities_test.cpp": "runs openssl",
     "tests/util/digest_test.cpp": "runs coreutils",
+    "tests/verify/error_name_test.cpp": "compares with the workstation's C library",
     "fuzz/compiled_manifest_fuzz.cpp": "replaces the program's operator new",
     "fuzz/explanation_fuzz.cpp": "reads with the simulator",
     "fuzz/integrity_fuzz.cpp": "has the linker wrap calls of the C library",
@@ -54,8 +55,11 @@ def hold_tool(platform, problems):
     core = cmake_sources("apktoolkit_core")
     compare("apktoolkit_core", platform.sources("apktoolkit_core"), core, problems)
     compare("apktoolkit", platform.sources("apktoolkit"), cmake_sources("apktoolkit"), problems)
+    compare("apktoolkit-verify", platform.sources("apktoolkit-verify"),
+            cmake_sources("apktoolkit-verify"), problems)
     compare("libzu", platform.sources("libzu"), cmake_sources("zu"), problems)
-    listed = core + cmake_sources("apktoolkit") + cmake_sources("zu")
+    listed = core + cmake_sources("apktoolkit") + cmake_sources("apktoolkit-verify")
+    listed += cmake_sources("zu")
     compare("the tool's folders", listed, map(str, tool_sources()), problems)
 
 
