@@ -94,7 +94,7 @@ def run_problems():
                      "    skipped A.B: no kernel",
                      "    FAILED A.C: one",
                      "    1 passed",
-                     "steps: 2 passed, 2 failed"], 1)
+                     "steps: 2 passed, 2 failed, 0 skipped"], 1)
         problems = [] if found == expected else [f"scripts/check ends with {found}"]
         if (found := check(folder, "arrows"))[1] != 0:
             problems.append(f"scripts/check does not pass: {found}")
@@ -106,5 +106,18 @@ def run_problems():
     return problems
 
 
+def emulator_problems():
+    """Without an emulator scripts/kernel is a step that was skipped."""
+    with tempfile.TemporaryDirectory() as name:
+        folder = pathlib.Path(name)
+        (folder / "scripts").mkdir()
+        shutil.copy(ROOT / "scripts/kernel", folder / "scripts")
+        write(folder / "scripts/setup", "[[ $1 != emulator ]]")
+        run = subprocess.run([folder / "scripts/kernel"], capture_output=True, text=True)
+        expected = (77, "skipped: there is no qemu, and it cannot be installed\n")
+        found = (run.returncode, run.stdout)
+        return [] if found == expected else [f"scripts/kernel without qemu ends with {found}"]
+
+
 if __name__ == "__main__":
-    sys.exit(report(list_problems() + setup_problems() + run_problems()))
+    sys.exit(report(list_problems() + setup_problems() + run_problems() + emulator_problems()))
