@@ -49,6 +49,8 @@ class Presenter {
   std::optional<std::string> Objection() const;
   bool Begin();
   void Show(const Outcome& outcome);
+  // What apktoolkit-verify said.
+  void ShowAnswer(const FileRun& run);
   void ShowProgress(const std::string& file, int seconds);
   void ShowSummary();
   void WritePage();
@@ -85,6 +87,27 @@ int EndWith(int status) {
   return Complain(std::max(status, kCannotSimulate), "cannot write to standard output");
 }
 
+void RunAll(const Options& options, Simulator* simulator, Presenter* presenter) {
+  const std::vector<std::string>& files = options.files;
+  std::vector<std::optional<Outcome>> outcomes(files.size());
+  RunInOrder(
+      files.size(), options.run.jobs,
+      [&](size_t i) { outcomes[i] = Judged(simulator->Run(files[i]), options.judge); },
+      [&](size_t i) { presenter->Show(*std::exchange(outcomes[i], std::nullopt)); },
+      [&](size_t i, int seconds) { presenter->ShowProgress(files[i], seconds); });
+  presenter->ShowSummary();
+  presenter->WritePage();
+}
+
+void VerifyAll(const Options& options, Simulator* simulator, Presenter* presenter) {
+  const std::vector<std::string>& files = options.files;
+  std::vector<std::optional<FileRun>> runs(files.size());
+  RunInOrder(
+      files.size(), options.run.jobs, [&](size_t i) { runs[i] = simulator->Run(files[i]); },
+      [&](size_t i) { presenter->ShowAnswer(*std::exchange(runs[i], std::nullopt)); },
+      [&](size_t i, int seconds) { presenter->ShowProgress(files[i], seconds); });
+}
+
 }  // namespace
 
 }  // namespace simulator
@@ -101,15 +124,11 @@ int main(int argc, char** argv) {
   if (!simulator.Prepare(&error)) return Complain(kCannotSimulate, error);
   if (!presenter.Begin()) return kCannotSimulate;
   CatchInterruptions();
-  const std::vector<std::string>& files = options.files;
-  std::vector<std::optional<Outcome>> outcomes(files.size());
-  RunInOrder(
-      files.size(), options.run.jobs,
-      [&](size_t i) { outcomes[i] = Judged(simulator.Run(files[i]), options.judge); },
-      [&](size_t i) { presenter.Show(*std::exchange(outcomes[i], std::nullopt)); },
-      [&](size_t i, int seconds) { presenter.ShowProgress(files[i], seconds); });
-  presenter.ShowSummary();
-  presenter.WritePage();
+  if (options.verify) {
+    VerifyAll(options, &simulator, &presenter);
+  } else {
+    RunAll(options, &simulator, &presenter);
+  }
   EndIfInterrupted();
   return presenter.Finish();
 }
@@ -153,6 +172,23 @@ void Presenter::Show(const Outcome& outcome) {
     Complain(kCannotSimulate, report.file + ": " + report.items[0].reason.Text());
   }
   status_ = std::max(status_, StatusOf(report.verdict));
+}
+
+void Presenter::ShowAnswer(const FileRun& run) {
+  EraseProgress();
+  Keep(run.journal);
+  for (const auto& event : run.record.events) {
+    const bool is_output = TextOf(event, "event") == "stdout";
+    if (is_output && !options_.json) std::cout << TextOf(event, "text");
+  }
+  std::cout.flush();
+  const bool has_failed = run.record.failure.kind != Failure::Kind::kNone;
+  std::string problem;
+  if (run.record.signal) problem = "it was killed by signal " + std::to_string(*run.record.signal);
+  if (has_failed) problem = Judged(run, options_.judge).report.items[0].reason.Text();
+  if (!problem.empty()) Complain(kCannotSimulate, run.record.file + ": " + problem);
+  const int status = static_cast<int>(run.record.status);
+  status_ = std::max(status_, problem.empty() ? status : kCannotSimulate);
 }
 
 // Erased again before anything else is written.

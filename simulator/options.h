@@ -25,6 +25,7 @@ struct Options {
   std::string journal;             // where the journal is kept; empty: it is not
   std::string html;                // where the page is written; empty: it is not
   bool json = false;               // the journal on standard output in place of the text
+  bool verify = false;             // ask the kernel which files it trusts, and nothing else
   std::vector<std::string> files;  // what the tool is run for; at least one
 };
 
