@@ -140,8 +140,9 @@ def simulate(run, directory, build, out):
     """Runs it in the simulated phone; the journal goes to OUT/NAME.journal."""
     if run.before:
         subprocess.run(run.before, shell=True, cwd=directory, check=True)
-    command = [build / "bin/apktoolkit-sim", "--json", "--state", out / "state",
-               "--tool", program_path(run.program, build), *run.options, directory / run.file]
+    command = [build / "bin/apktoolkit-sim", "--json", "--state", out / "state", *run.options]
+    command += ["--verify"] if run.program == VERIFY else ["--tool", build / "bin" / run.program]
+    command.append(directory / run.file)
     if run.mount == "ro":
         command = [*namespace(), "sh", "-c",
                    'mount --bind "$0" "$0" && mount -o remount,bind,ro "$0" && exec "$@"', directory,
@@ -150,10 +151,6 @@ def simulate(run, directory, build, out):
     if result.returncode not in (0, 1, 3, 4) or b'"event":"exit"' not in result.stdout:
         sys.exit(f"runs: the simulation of {run.name} ends with {result.returncode}")
     (out / f"{run.name}.journal").write_bytes(result.stdout)
-
-
-def program_path(program, build):
-    return build / "bin" / program
 
 
 def namespace():
