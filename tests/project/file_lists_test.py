@@ -57,6 +57,11 @@ def hold_tool(platform, problems):
     compare("apktoolkit", platform.sources("apktoolkit"), cmake_sources("apktoolkit"), problems)
     compare("apktoolkit-verify", platform.sources("apktoolkit-verify"),
             cmake_sources("apktoolkit-verify"), problems)
+    compare("apktoolkit-all", platform.sources("apktoolkit-all"),
+            cmake_sources("apktoolkit-all", "integration") +
+            cmake_sources("apktoolkit_caller", "integration"), problems)
+    compare("apktoolkit-bound", platform.sources("apktoolkit-bound"),
+            cmake_sources("apktoolkit-bound", "integration"), problems)
     compare("libzu", platform.sources("libzu"), cmake_sources("zu"), problems)
     listed = core + cmake_sources("apktoolkit") + cmake_sources("apktoolkit-verify")
     listed += cmake_sources("zu")
