@@ -60,7 +60,7 @@ TEST(RunProgram, KillsWhatTakesTooLong) {
   Expect(RunProgram({"/bin/sleep", "60"}, limits), RunEnd::kTimedOut, 0);
   const auto taken = std::chrono::steady_clock::now() - start;
   EXPECT_GE(taken, std::chrono::milliseconds(200));
-  EXPECT_LT(taken, std::chrono::seconds(20));
+  EXPECT_LT(taken, std::chrono::seconds(5));
   EXPECT_EQ(waitpid(-1, nullptr, WNOHANG), -1);  // it is gone
 }
 
@@ -75,33 +75,44 @@ TEST(RunProgram, ThatIsNotThereIsNotStarted) {
   Expect(RunProgram({"/dev/null"}, {}), RunEnd::kNotStarted, 0);
 }
 
+// What the standard streams of a shell are, before it redirects anything.
+std::string Streams() {
+  const TempDir folder;
+  const std::string file = folder / "output";
+  const char script[] =
+      "streams=$(readlink /proc/$$/fd/0 /proc/$$/fd/1 /proc/$$/fd/2); echo \"$streams\" >\"$0\"";
+  RunProgram({"/bin/sh", "-c", script, file}, {});
+  return ContentOf(file);
+}
+
 TEST(RunProgram, HasNullForItsStreamsAndNothingElseOpen) {
   const int inherited = open("/dev/null", O_RDONLY);  // without O_CLOEXEC
-  EXPECT_EQ(Printed("for fd in /proc/self/fd/0 /proc/self/fd/2; do readlink $fd; done"),
-            "/dev/null\n/dev/null\n");
-  // 3 is the listing's own.
-  EXPECT_EQ(Printed("ls /proc/self/fd"), "0\n1\n2\n3\n");
+  EXPECT_EQ(Streams(), "/dev/null\n/dev/null\n/dev/null\n");
+  EXPECT_EQ(Printed("ls /proc/self/fd"), "0\n1\n2\n3\n");  // 3 is the listing's own
   close(inherited);
 }
 
 // A daemon may have no streams of its own.
 TEST(RunProgram, HasItsStreamsThoughThisProcessHasNone) {
-  const FreeDescriptor input(STDIN_FILENO), output(STDOUT_FILENO), errors(STDERR_FILENO);
-  const TempDir folder;
-  const std::string file = folder / "output";
-  const RunResult run = Shell("ls /proc/self/fd", file);
-  const std::string listed = ContentOf(file);
-  EXPECT_EQ(run.end, RunEnd::kExited);
-  EXPECT_EQ(listed, "0\n1\n2\n3\n");
+  std::string streams;
+  {
+    const FreeDescriptor input(STDIN_FILENO), output(STDOUT_FILENO), errors(STDERR_FILENO);
+    streams = Streams();
+  }
+  EXPECT_EQ(streams, "/dev/null\n/dev/null\n/dev/null\n");
 }
 
+// A shell would unblock them itself.
 TEST(RunProgram, HasNoSignalBlocked) {
   sigset_t some, before;
   sigemptyset(&some);
   sigaddset(&some, SIGTERM);
   pthread_sigmask(SIG_BLOCK, &some, &before);
-  EXPECT_EQ(Printed("grep ^SigBlk: /proc/self/status"), "SigBlk:\t0000000000000000\n");
+  const TempDir folder;
+  const std::string file = folder / "status";
+  RunProgram({"/bin/cp", "/proc/self/status", file}, {});
   pthread_sigmask(SIG_SETMASK, &before, nullptr);
+  EXPECT_NE(ContentOf(file).find("\nSigBlk:\t0000000000000000\n"), std::string::npos);
 }
 
 TEST(RunProgram, LimitsWrittenMemory) {

@@ -171,6 +171,13 @@ TEST(Bound, RunsNothingButTheCommand) {
   EXPECT_EQ(RunProcess({APKTOOLKIT_BOUND_PATH, key, "/bin/false", apk}).status, 1);
 }
 
+TEST(Bound, LeavesNothingOpenForTheCommand) {
+  const ProcessResult run =
+      RunProcess({APKTOOLKIT_BOUND_PATH, DigestOfKey("apksigner-sha256-2048"), "/bin/sh", "-c",
+                  "ls /proc/self/fd", Golden("apksigner-sha256-2048/base.apk")});
+  EXPECT_EQ(run.output, "0\n1\n2\n3\n");  // 3 is the listing's own
+}
+
 // The tool finds descriptor 3 free, as when it is started by itself, and signs.
 TEST(Bound, HasTheToolSign) {
   const std::string apk = Golden("apksigner-sha256-2048/base.apk");
