@@ -1,13 +1,15 @@
-// apktoolkit-all DIRECTORY: has every installed package signed, after an update of the system.
-// Reads a line "DIGEST[,DIGEST]... PATH" for each from standard input, as the package manager lists
-// them (SignerDigests.java), and prints a line for each. DIRECTORY is where the programs lie:
+// apktoolkit-all DIRECTORY LIST: has every installed package signed, after an update of the system.
+// The file LIST has a line "DIGEST[,DIGEST]... PATH" for each, as the package manager knows their
+// signers (SignerDigests.java); what came of each is printed. DIRECTORY is where the programs lie:
 // /system/bin.
 //
 // What the kernel trusts already is passed over, so that a run that was cut off goes on where it
-// was. The exit status: 0 all are trusted, 1 some are not, 2 the command line or a line of input is
-// wrong.
+// was. The exit status: 0 all are trusted, 1 some are not, 2 the command line or the list is wrong.
+#include <algorithm>
+#include <cerrno>
 #include <cstdio>
 #include <cstdlib>
+#include <cstring>
 #include <string>
 
 #include "integration/caller/sign_package.h"
@@ -18,11 +20,11 @@ constexpr int kAllTrusted = 0;
 constexpr int kNotAllTrusted = 1;
 constexpr int kWrongInput = 2;
 
-// The next line without its end; false at the end of the input.
-bool ReadLine(std::string* line) {
+// The next line without its end; false at the end of the file.
+bool ReadLine(FILE* list, std::string* line) {
   char* text = nullptr;
   size_t size = 0;
-  const ssize_t length = getline(&text, &size, stdin);
+  const ssize_t length = getline(&text, &size, list);
   if (length > 0) line->assign(text, static_cast<size_t>(length));
   free(text);
   if (length > 0 && line->back() == '\n') line->pop_back();
@@ -37,29 +39,35 @@ bool Parse(const std::string& line, InstalledPackage* package) {
   return true;
 }
 
+bool HasTrust(SignOutcome outcome) {
+  return outcome == SignOutcome::kTrustedAlready || outcome == SignOutcome::kTrusted;
+}
+
 }  // namespace
 
 int main(int argc, char* argv[]) {
-  if (argc != 2) {
-    fputs("usage: apktoolkit-all DIRECTORY <LIST\n", stderr);
+  if (argc != 3) {
+    fputs("usage: apktoolkit-all DIRECTORY LIST\n", stderr);
     return kWrongInput;
   }
-  bool is_input_right = true;
-  bool all_trusted = true;
-  for (std::string line; ReadLine(&line);) {
+  FILE* const list = fopen(argv[2], "re");
+  if (list == nullptr) {
+    fprintf(stderr, "apktoolkit-all: cannot open %s: %s\n", argv[2], strerror(errno));
+    return kWrongInput;
+  }
+  int status = kAllTrusted;
+  for (std::string line; ReadLine(list, &line);) {
     InstalledPackage package;
     if (!Parse(line, &package)) {
       fprintf(stderr, "apktoolkit-all: no line of signers and path: %s\n", line.c_str());
-      is_input_right = false;
+      status = kWrongInput;
       continue;
     }
     const SignOutcome outcome = SignPackage(argv[1], package, RunLimits());
-    if (outcome != SignOutcome::kTrustedAlready && outcome != SignOutcome::kTrusted) {
-      all_trusted = false;
-    }
+    if (!HasTrust(outcome)) status = std::max(status, kNotAllTrusted);
     printf("%s: %s\n", package.path.c_str(), Describe(outcome));
     fflush(stdout);  // for whoever watches
   }
-  if (!is_input_right) return kWrongInput;
-  return all_trusted ? kAllTrusted : kNotAllTrusted;
+  fclose(list);
+  return status;
 }

@@ -114,8 +114,7 @@ class AfterAnUpdate : public Phone {
  protected:
   ProcessResult SignAll(const std::string& list) const {
     const std::string file = data_.Write("list", ToBytes(list));
-    return RunProcess(
-        {"sh", "-c", "exec \"$0\" \"$1\" <\"$2\"", APKTOOLKIT_ALL_PATH, bin_.path(), file});
+    return RunProcess({APKTOOLKIT_ALL_PATH, bin_.path(), file});
   }
 
   static std::string Line(const InstalledPackage& package) {
@@ -163,9 +162,18 @@ TEST_F(AfterAnUpdate, WrongLinesAreToldOfAndPassedOver) {
   EXPECT_EQ(run.status, 2);
 }
 
-TEST(All, NeedsTheDirectoryOfThePrograms) {
-  EXPECT_EQ(RunProcess({APKTOOLKIT_ALL_PATH}).status, 2);
-  EXPECT_EQ(RunProcess({APKTOOLKIT_ALL_PATH, "/system/bin", "x"}).status, 2);
+TEST(All, NeedsTheProgramsAndAList) {
+  for (const std::vector<std::string>& words : std::vector<std::vector<std::string>>{
+           {}, {"/system/bin"}, {"/system/bin", "/dev/null", "/dev/null"}}) {
+    std::vector<std::string> command = {APKTOOLKIT_ALL_PATH};
+    command.insert(command.end(), words.begin(), words.end());
+    const ProcessResult run = RunProcess(command);
+    EXPECT_EQ(run.status, 2);
+    EXPECT_EQ(run.errors, "usage: apktoolkit-all DIRECTORY LIST\n");
+  }
+  const ProcessResult run = RunProcess({APKTOOLKIT_ALL_PATH, "/system/bin", "/nowhere/list"});
+  EXPECT_EQ(run.status, 2);
+  EXPECT_EQ(run.errors, "apktoolkit-all: cannot open /nowhere/list: No such file or directory\n");
 }
 
 }  // namespace

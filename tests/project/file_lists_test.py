@@ -31,7 +31,7 @@ WORKSTATION_ONLY = {
 KNOWN_TYPES = {"cc_binary", "cc_defaults", "cc_library_shared", "cc_library_static", "cc_test",
                "filegroup"}
 KNOWN_PROPERTIES = {"cflags", "compile_multilib", "cpp_std", "data", "defaults",
-                    "export_include_dirs", "ldflags", "local_include_dirs", "name", "shared_libs",
+                    "export_include_dirs", "init_rc", "ldflags", "local_include_dirs", "name", "shared_libs",
                     "srcs", "static_libs"}
 
 # For headers that are the system's here and the user's there.
