@@ -27,7 +27,9 @@ RECORD = re.compile(r"(\S+) ([VDIWEF]) \d\d-\d\d \d\d:\d\d:\d\d +\d+ +\d+ (.*)",
 OF_SIMULATION = {"journal", "start", "attached", "verdict", "stdout"}
 SEEN_BY_MODULE = {"integrity", "sign", "verify"}
 INFORMATION = 4  # the workstation's liblog keeps records of a lower priority to itself
-COMPLAINT = re.compile(r"BUG:|WARNING:|Oops|Call [Tt]race|refcount_t|general protection")
+COMPLAINT = re.compile(r"BUG:|WARNING:|Oops|Call [Tt]race|refcount_t|general protection|avc: +denied")
+# How a kernel with a policy tells that the installer's domain started a program of the tool's.
+ENTRY = re.compile(r"avc: +granted +{ transition } .* scontext=u:r:installd:s0 tcontext=u:r:apktoolkit:s0 ")
 
 
 class Kernel:
@@ -39,9 +41,9 @@ class Kernel:
         self.disk = directory / "disk.img"
         lines = (self.results / "facts").read_text().splitlines()
         self.facts = dict(line.split(" ", 1) for line in lines)
-        self.problems = [f"the kernel complains: {line}"
-                         for line in (self.results / "dmesg").read_text(errors="replace").splitlines()
-                         if COMPLAINT.search(line)]
+        self.messages = (self.results / "dmesg").read_text(errors="replace").splitlines()
+        self.problems = [f"the kernel complains: {line}" for line in self.messages if COMPLAINT.search(line)]
+        self.has_policy = (directory / "root/policy").exists()
         self.verdicts = {}  # "same" or "DIFFERS", by the name of the run
 
     def events(self, run):
@@ -129,6 +131,14 @@ def check_disk(kernel, files, all_runs):
     return len(payloads)
 
 
+def check_domain(kernel, all_runs):
+    """With a policy each run that is confined was one in the tool's domain."""
+    entered = sum(bool(ENTRY.search(line)) for line in kernel.messages)
+    confined = sum(run.confined for run in all_runs)
+    if kernel.has_policy and entered != confined:
+        kernel.problems.append(f"the tool's domain was entered {entered} times in {confined} confined runs")
+
+
 def summary(expected, run):
     """What was asked of the phone, in few words."""
     events, _ = simulated(expected, run)
@@ -149,6 +159,7 @@ def summary(expected, run):
 def print_table(kernels, expected, all_runs):
     rows = [["", "what the phone did"] + [kernel.facts["release"] for kernel in kernels]]
     rows += [["", ""] + [f"{k.facts['machine']}, {k.facts['page']} pages" for k in kernels]]
+    rows += [["", ""] + ["SELinux enforcing" if k.has_policy else "" for k in kernels]]
     rows += [["", "seconds to boot, and to run"] +
              [f"{float(k.facts['booted']):.0f} + {float(k.facts['ended']) - float(k.facts['booted']):.0f}"
               for k in kernels]]
@@ -170,6 +181,7 @@ def main():
             if run.program == runs.PROBE:
                 probe_answers(kernel, files, run)
         kept += check_disk(kernel, files, all_runs)
+        check_domain(kernel, all_runs)
     print_table(kernels, expected, all_runs)
     problems = [f"{kernel.name}: {problem}" for kernel in kernels for problem in kernel.problems]
     if problems:

@@ -48,11 +48,15 @@ class Run:
 
     before: a command of the shell that changes the files first, here and there.
     feature: whether the kernel has it; mount: how the files are mounted.
+    confined: on a kernel with a policy it runs in the tool's domain. The policy is for regular files,
+    and the probe is no program of a product.
     """
 
-    def __init__(self, name, file, *options, program=TOOL, before=None, feature=True, mount="rw"):
+    def __init__(self, name, file, *options, program=TOOL, before=None, feature=True, mount="rw",
+                 confined=True):
         self.name, self.file, self.options, self.program = name, file, list(options), program
         self.before, self.feature, self.mount = before, feature, mount
+        self.confined = confined and program != PROBE
 
 
 def all_runs(golden):
@@ -81,10 +85,10 @@ def all_runs(golden):
         Run("jar-changed-since", "jars/changed.jar", before=changed),
         Run("jar-revoked", "jars/other.jar", "--verify-errno", "EKEYREVOKED"),
         Run("jar-kernel-refuses", "jars/refused.jar", "--sign-errno", "EPERM"),
-        Run("library-is-fifo", "fifo-library/base.apk"),
+        Run("library-is-fifo", "fifo-library/base.apk", confined=False),
         Run("link", "other/link.apk"),
-        Run("fifo", "other/fifo"),
-        Run("directory", "other"),
+        Run("fifo", "other/fifo", confined=False),
+        Run("directory", "other", confined=False),
         Run("text", "other/text"),
         Run("empty", "other/empty"),
         Run("not-there", "other/missing"),
@@ -93,8 +97,8 @@ def all_runs(golden):
         Run("verify-refused-package", "golden/changed-dex/base.apk", program=VERIFY),
         Run("verify-changed-jar", "jars/changed.jar", program=VERIFY),
         Run("verify-revoked", "jars/other.jar", "--verify-errno", "EKEYREVOKED", program=VERIFY),
-        Run("verify-fifo", "other/fifo", program=VERIFY),
-        Run("verify-directory", "other", program=VERIFY),
+        Run("verify-fifo", "other/fifo", program=VERIFY, confined=False),
+        Run("verify-directory", "other", program=VERIFY, confined=False),
         Run("verify-not-there", "other/missing", program=VERIFY),
         Run("read-only", f"{GOOD}/base.apk", mount="ro"),
         Run("read-only-verify", f"{GOOD}/base.apk", program=VERIFY, mount="ro"),
@@ -175,7 +179,7 @@ def guest_lines(run, before):
     if run.feature:
         values = {**PARAMETERS, **dict(zip(run.options[::2], run.options[1::2]))}
         yield "phone " + " ".join(str(getattr(errno, value, value)) for value in values.values())
-    yield f"run {run.name} {run.program} $files/{run.file}"
+    yield f"run {run.name} {run.program} $files/{run.file}" + (" $installer" if run.confined else "")
 
 
 def guest_script(runs):

@@ -33,7 +33,9 @@ GRANTED = {
         "labeledfs:filesystem getattr",
         "apktoolkit_jar_file:dir search",
         "apktoolkit_jar_file:file getattr map open read",
+        "installd:fd use",
         "installd:process sigchld",
+        "apktoolkit_all:fd use",
         "apktoolkit_all:process sigchld",
     ],
     "apktoolkit_all": [
