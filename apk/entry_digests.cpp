@@ -1,10 +1,7 @@
 #include "apk/entry_digests.h"
 
 #include <algorithm>
-#include <cstring>
 #include <utility>
-
-#include "crypto/wrapping.h"
 
 namespace ApkTools {
 
@@ -17,13 +14,9 @@ ManifestMf::Section::value_type DigestOf(const ManifestMf::Section& section) {
 
 // Not std::hash: in the C++ libraries of older releases it wraps without being marked, and a
 // product may build with a trap for that.
-WRAPS_ON_PURPOSE size_t Hash(std::string_view name) {
+size_t Hash(std::string_view name) {
   size_t hash = 0;
-  for (size_t word; !name.empty(); name.remove_prefix(std::min(sizeof(word), name.size()))) {
-    word = 0;
-    memcpy(&word, name.data(), std::min(sizeof(word), name.size()));
-    hash = ((hash ^ word) * 0x9e3779b97f4a7c15) ^ (hash >> 32);
-  }
+  for (const char c : name) hash = (hash << 5 | hash >> 59) ^ static_cast<uint8_t>(c);
   return hash;
 }
 

@@ -2,6 +2,7 @@
 
 #include <gtest/gtest.h>
 
+#include <iterator>
 #include <string>
 
 #include "support/log_capture.h"
@@ -80,6 +81,27 @@ TEST(EntryDigests, OfManyEqualNamesTheLastSectionCounts) {
   EXPECT_EQ("SHA-256-Digest 100", recorded.Of("a"));
   EXPECT_EQ("SHA-256-Digest 99", recorded.Of("b"));
   EXPECT_EQ("SHA-256-Digest 0", recorded.Of("z"));
+}
+
+// The table of names in no order is sorted by a hash that turns by 5 bits and adds a letter: "b"
+// and "A" make 0x62 << 5 ^ 0x41, "c" and "a" 0x63 << 5 ^ 0x61, both 0xc01. After 64 letters it is
+// turned back.
+TEST(EntryDigests, NamesOfEqualHashesAreToldApart) {
+  const std::string middle(63, '/');
+  const std::string names[] = {"ca", "bA", "c" + middle + "d", "d" + middle + "c"};
+  for (size_t last = 0; last < std::size(names); ++last) {
+    std::string sections;
+    for (size_t i = 0; i < std::size(names); ++i) {
+      if (i != last) sections += Section(names[i], std::to_string(i));
+    }
+    const Recorded without(sections);
+    EXPECT_EQ("none", without.Of(names[last]));
+    const Recorded recorded(sections + Section(names[last], "0") + Section("b", "b") +
+                            Section(names[last], std::to_string(last)));
+    for (size_t i = 0; i < std::size(names); ++i) {
+      EXPECT_EQ("SHA-256-Digest " + std::to_string(i), recorded.Of(names[i])) << last;
+    }
+  }
 }
 
 TEST(EntryDigests, ALaterSectionWithoutADigestReplacesNothing) {
