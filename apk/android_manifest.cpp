@@ -57,6 +57,7 @@ bool Apk::ParseAndroidManifest(std::vector<uint8_t> bytes) {
     const char16_t* const element_name = parser.getElementName(&length);
     const Text element = View(element_name, length);
     if (Equals(element, "manifest")) {
+      // NOLINTNEXTLINE(readability-container-size-empty): only later releases' String8 has empty().
       if (package_name.length() == 0) package_name = ReadPackageName(parser, &nameless);
     } else if (!ss_permission_required_) {
       ss_permission_required_ = AsksForSecureStorage(parser, element);

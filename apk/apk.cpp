@@ -7,8 +7,9 @@
 
 namespace ApkTools {
 
-// Deliberate: a pointer that can be changed, and not the text itself. The name is looked up through
-// it at each use, so that one place decides which entry the manifest is.
+// Deliberate: a pointer that can be changed, and not the text itself. The entry that is read as the
+// manifest is looked up through it at each use. The names that need no digest (CanSkipValidation)
+// do not follow it: they are a table of their own.
 const char* Apk::kMANIFEST_MF = "META-INF/MANIFEST.MF";
 
 void Apk::Init(int fd, const char* path) {
@@ -38,7 +39,8 @@ bool Apk::VerifyPackage(std::vector<uint8_t> android_manifest) {
 
   if (!InitCertSf()) return false;
   if (!ValidateManifest(manifest)) {
-    // Deliberate: ValidateManifest has said the same; readers of the log know the text as a pair.
+    // Deliberate: ValidateManifest has said the same. Programs that parse the log match on the
+    // pair.
     LogError("Can't validate manifest.\n");
     return false;
   }

@@ -32,7 +32,8 @@ inline std::string InstalledLibraryPath(const std::string& package_path,
     // Deliberate: plain prefixes. No "/" has to follow, so "lib/armeabiX/a.so" is looked for in
     // "lib/armX/"; the digest check that follows decides all the same.
     if (entry_name.compare(0, row.entry_prefix.size(), row.entry_prefix) != 0) continue;
-    const std::string directory = package_path.substr(0, package_path.rfind('/') + 1);
+    const size_t slash = package_path.rfind('/');
+    const auto directory = package_path.substr(0, slash == std::string::npos ? 0 : slash + 1);
     return directory + row.installed + entry_name.substr(row.entry_prefix.size());
   }
   return {};

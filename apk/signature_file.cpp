@@ -61,7 +61,7 @@ bool Apk::VerifyCertificate(std::vector<uint8_t>& block, std::vector<uint8_t>& s
                             std::vector<uint8_t>& key) {
   pkcs7 record = {};
   if (processCert(block.data(), static_cast<uint32_t>(block.size()), &record) != 0) {
-    // Deliberate: without a line end, as readers of the log know it.
+    // Deliberate: without a line end. Programs that parse the log match on the text.
     LogError("Unknown certificate type");
     return false;
   }

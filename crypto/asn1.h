@@ -64,7 +64,8 @@ int asn1_parse_oid(const uint8_t* buf, size_t len, asn1_oid* oid);
 int asn1_get_oid(const uint8_t* buf, size_t len, asn1_oid* oid, const uint8_t** next);
 
 // Writes the arcs as dotted text into the `size` bytes at `buf`: cut where it does not fit, always
-// NUL-terminated, nothing at all when `size` is 0.
+// NUL-terminated, nothing at all when `size` is 0. The tool itself prints no object identifier:
+// this is for the diagnostics of programs that read certificates with this library, and for tests.
 void asn1_oid_to_str(const asn1_oid* oid, char* buf, size_t size);
 
 // The named bits of a BIT STRING (X.690 §8.6) as an integer: `buf` holds the contents, the count of

@@ -9,8 +9,11 @@
 
 #include "crypto/wrapping.h"
 
-// Deliberate: limbs have 32 bits and no arithmetic on them is wider, on 64-bit processors too:
-// there is one way to compute, in half limbs, and it needs no double-width type of the compiler's.
+// Deliberate: limbs have 32 bits, and no sum or product of limbs has more, on 64-bit processors
+// too: there is one way to compute, in half limbs, and it needs no double-width type of the
+// compiler's. The object code for the device has no wider multiplication either (scripts/check
+// android looks for one). Elsewhere a compiler may use one for a vector of half limbs, as gcc does
+// for x86-64.
 
 namespace {
 

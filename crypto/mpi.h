@@ -75,7 +75,8 @@ int mpi_compare(const mpi* A, const mpi* B);
 // result that no longer has an int's bit length counts as memory exhausted and leaves X unchanged.
 int mpi_shift_l(mpi* X, int count);
 
-// X = abs(A) + abs(B), with sign +1. X may be A, B or both.
+// X = abs(A) + abs(B), with sign +1. X may be A, B or both. Verification itself adds no two
+// numbers: this is the counterpart of mpi_sub_abs, and tests hold both against GMP.
 int mpi_add_abs(mpi* X, const mpi* A, const mpi* B);
 
 // X = abs(A) - abs(B), with sign +1. X may be A, B or both. Returns kMpiNegativeResult, with X

@@ -188,7 +188,7 @@ bool ReadDigestAlgorithm(const Block& block, size_t offset, size_t end, asn1_hdr
          asn1_get_oid(algorithm->payload, algorithm->length, &oid, &next) == 0;
 }
 
-// Deliberate: the lines stay as readers of standard output know them, spelling included.
+// Deliberate: the lines keep their spelling. Programs that read standard output match on them.
 bool Fail(const char* format, ...) {
   printf("CERT_PARCER [ERROR]: ");
   va_list arguments;

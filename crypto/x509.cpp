@@ -50,9 +50,9 @@ uint32_t ToUint32(const asn1_hdr& integer) {
 
 bool HoldsNul(const asn1_hdr& hdr) { return memchr(hdr.payload, 0, hdr.length) != nullptr; }
 
-// The parts of a certificate, in order. Those that return an int give the codes of
-// x509_certificate_parse, unless they say otherwise; of those that return a bool the caller knows
-// the code.
+// The parts of a certificate, in order. ParseTbs, ParseVersionAndSerial, ParseOptionalFields and
+// ParseSignature return a code of x509_certificate_parse. All others return whether they succeeded,
+// as a bool, or as 0 and a negative number of their own, and their caller knows the code.
 int ParseTbs(Range tbs, x509_certificate* cert);
 int ParseVersionAndSerial(Range* tbs, x509_certificate* cert);
 bool ParseAlgorithm(Range* range, asn1_oid* oid, asn1_oid* params);
@@ -171,7 +171,7 @@ bool ParseAlgorithm(Range* range, asn1_oid* oid, asn1_oid* params) {
 
 // A Name (RFC 5280 §4.1.2.4); `next` receives the position after it. Returns 0, or -3 for a missing
 // SEQUENCE, -7 for a missing SET, -8 for a missing attribute type, -1 for an attribute value that
-// is missing, holds a NUL or is one too many; `name` is empty after a failure.
+// is missing, holds a NUL or is one too many; each becomes -12. `name` is empty after a failure.
 int x509_parse_name(const uint8_t* buf, size_t len, x509_name* name, const uint8_t** next) {
   Range range = {buf, len};
   asn1_hdr hdr;
@@ -189,7 +189,8 @@ int x509_parse_name(const uint8_t* buf, size_t len, x509_name* name, const uint8
   return 0;
 }
 
-// Deliberate: of a RelativeDistinguishedName only the first attribute is read.
+// Returns as x509_parse_name. Deliberate: of a RelativeDistinguishedName only the first attribute
+// is read.
 int ParseRdn(Range set, x509_name* name) {
   asn1_hdr hdr;
   if (!NextUniversal(&set, kAsn1Sequence, &hdr)) return -3;
@@ -239,8 +240,9 @@ int TwoDigits(const uint8_t* digits) {
   return tens < 0 || tens > 9 || ones < 0 || ones > 9 ? -1 : tens * 10 + ones;
 }
 
-// The two forms of RFC 5280 §4.1.2.5: UTC, with seconds and without fractions of them. Deliberate:
-// nobody reads the times, and no number is too large for its field.
+// The two forms of RFC 5280 §4.1.2.5: UTC, with seconds and without fractions of them. Returns 0,
+// or -1 for any other. Deliberate: nobody reads the times, and no number is too large for its
+// field.
 int x509_parse_time(const uint8_t* value, size_t len, uint32_t tag, x509_parser_time* time) {
   constexpr size_t kAfterYear = sizeof("MMDDHHMMSSZ") - 1;
   const size_t year_digits = tag == kAsn1UtcTime ? 2 : 4;

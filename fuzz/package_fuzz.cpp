@@ -8,6 +8,7 @@
 #include <unistd.h>
 #include <ziparchive/zip_archive.h>
 
+#include <algorithm>
 #include <atomic>
 #include <filesystem>
 #include <fstream>

@@ -75,7 +75,7 @@ std::vector<uint8_t> JarKeyBlock(const std::string& path) {
 }
 
 // Deliberate: the location of `fd` serves for this message alone; the registration goes ahead. The
-// text says "oat" of packages and JARs alike, as readers of the log know it.
+// text says "oat" of packages and JARs alike. Programs that parse the log match on it.
 void ReportMissingLocation(int fd) {
   if (GetFilenameByFd(fd).empty()) LogError("Can't get oat location from fd=%d\n", fd);
 }

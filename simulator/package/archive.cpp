@@ -8,7 +8,8 @@ namespace {
 
 void SilenceTheLibrary() {
   static const bool done = [] {
-    __android_log_set_logger([](const __android_logger_data*, const char*) {});
+    // A logger's parameters are others in each generation of the log library.
+    __android_log_set_logger([](auto...) {});
     return true;
   }();
   static_cast<void>(done);

@@ -1,5 +1,5 @@
 // The Android log of the phone: the records of the tool and of the platform libraries under it.
-#include <android/log.h>
+#include "simulator/phone/log_library.h"
 
 #include <cstdarg>
 #include <cstdio>
@@ -64,9 +64,14 @@ STAND_IN int __android_log_buf_print(int, int priority, const char* tag, const c
   return result;
 }
 
-// What the platform's C++ libraries, the zip library among them, write their warnings through.
+// The platform's C++ libraries, the zip library among them, write their warnings through one of
+// these two: each generation of the log library has its own.
 STAND_IN void __android_log_write_logger_data(__android_logger_data* data, const char* text) {
-  Log(data->priority, data->tag, text);
+  ReadLogRecord(data, text, Log);
+}
+
+STAND_IN void __android_log_write_log_message(__android_log_message* message) {
+  ReadLogRecord(message, Log);
 }
 
 STAND_IN void __android_log_assert(const char* condition, const char* tag, const char* format,

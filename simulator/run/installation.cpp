@@ -105,7 +105,7 @@ std::optional<LibraryName> ParseName(const std::string& entry) {
   constexpr size_t kPrefix = 4;  // "lib/"
   const size_t slash = entry.find('/', kPrefix);
   if (slash == std::string::npos || entry.find('\0') != std::string::npos) return {};
-  const LibraryName name = {entry.substr(kPrefix, slash - kPrefix), entry.substr(slash + 1)};
+  LibraryName name = {entry.substr(kPrefix, slash - kPrefix), entry.substr(slash + 1)};
   if (name.file.find('/') != std::string::npos || name.file.size() > NAME_MAX) return {};
   return name;
 }

@@ -128,12 +128,14 @@ inline constexpr Cause kExponentRefused = {
 inline constexpr Cause kCertificateIssued = {
     "certificate-issued",
     "its certificate was issued by another (%s), and this tool takes self-signed ones alone",
-    "Sign it with a self-signed certificate, which keytool -genkeypair makes."};
+    "Sign it with a self-signed certificate: keytool -genkeypair -keyalg RSA -sigalg "
+    "SHA256withRSA."};
 inline constexpr Cause kCertificateDigest = {
     "certificate-digest",
     "its certificate is signed with %s, and this tool reads MD5, SHA-1 and SHA-256 with RSA",
     "Make a certificate for the same key with SHA-256: keytool -selfcert -sigalg SHA256withRSA. "
-    "keytool takes SHA-384 by itself for keys of more than 3072 bits."};
+    "Without -sigalg keytool takes SHA-384: that of JDK 21 for every RSA key, that of JDK 17 for "
+    "keys of more than 3072 bits."};
 inline constexpr Cause kCertificateChanged = {
     "certificate-changed", "its certificate does not carry a signature by its own key",
     "Sign the package again; if it comes back, make a new certificate for the key."};

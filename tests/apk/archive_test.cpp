@@ -129,6 +129,13 @@ TEST(ApkEntries, AnEntryWhoseDataDescriptorLiesIsInconsistent) {
             "Can't extract Android Manifest: Inconsistent information\n");
 }
 
+// 0xFF begins a block of the type that deflate reserves (RFC 1951 section 3.2.3).
+TEST(ApkEntries, AnEntryThatDoesNotInflateIsReportedWithTheLibrarysOwnCode) {
+  ZipItem item = AndroidManifestItem(true);
+  item.raw = Bytes(Deflate(item.data).size(), 0xFF);
+  EXPECT_EQ(LogOfAndroidManifest(item), "Can't extract Android Manifest: Zlib error\n");
+}
+
 TEST(ApkEntries, AnArchiveWithTwoEntriesOfANameIsNotOpened) {
   Package package = MakePackage(WithoutDex());
   package.items.push_back(package.Item(kAndroidManifestName));

@@ -6,16 +6,11 @@
 #include <string>
 #include <vector>
 
-#include "support/bytes.h"
+#include "support/guarded_bytes.h"
 
 namespace {
 
-using Bytes = std::vector<uint8_t>;
-
-Bytes ToBytes(const std::string& text) { return {text.begin(), text.end()}; }
-
-// What base64decode() makes of `text` with `room` bytes to write to; the byte behind the room is
-// watched.
+// What base64decode() makes of `text` with `room` bytes to write to; memory ends behind both.
 struct Decoded {
   int result;
   size_t length;
@@ -34,12 +29,12 @@ void PrintTo(const Decoded& decoded, std::ostream* out) {
 constexpr uint8_t kUntouched = 0xEE;
 
 Decoded Decode(const std::string& text, size_t room) {
-  Bytes bytes(room + 1, kUntouched);
+  const GuardedBytes in(ToBytes(text));
+  GuardedBytes out(Bytes(room, kUntouched));
   size_t length = room;
-  const int result = base64decode(text.data(), text.size(), bytes.data(), &length);
-  EXPECT_EQ(kUntouched, bytes[room]);
-  bytes.pop_back();
-  return {result, length, bytes};
+  const int result =
+      base64decode(reinterpret_cast<const char*>(in.data()), in.size(), out.data(), &length);
+  return {result, length, Bytes(out.data(), out.data() + room)};
 }
 
 // RFC 4648, section 10.

@@ -4,12 +4,21 @@
 
 #include <iterator>
 #include <string>
+#include <vector>
 
 #include "support/log_capture.h"
 
 using ApkTools::EntryDigests;
 
 namespace {
+
+// "ATTRIBUTE VALUE", or "none".
+std::string Found(const EntryDigests& digests, const std::string& name) {
+  std::string digest_name, digest;
+  if (digests.Find(name, digest_name, digest)) return digest_name + " " + digest;
+  EXPECT_EQ("", digest_name + digest);
+  return "none";
+}
 
 // What a manifest of these sections records.
 class Recorded {
@@ -20,13 +29,7 @@ class Recorded {
     digests_.List();
   }
 
-  // "ATTRIBUTE VALUE", or "none".
-  std::string Of(const std::string& name) const {
-    std::string digest_name, digest;
-    if (digests_.Find(name, digest_name, digest)) return digest_name + " " + digest;
-    EXPECT_EQ("", digest_name + digest);
-    return "none";
-  }
+  std::string Of(const std::string& name) const { return Found(digests_, name); }
 
  private:
   EntryDigests digests_;
@@ -163,6 +166,61 @@ TEST(EntryDigests, LoadingAnotherManifestForgetsTheFirstOnes) {
     EXPECT_FALSE(digests.Find("a", digest_name, digest));
     EXPECT_EQ(other != "Key:x", digests.Find("b", digest_name, digest));
   }
+}
+
+// The same of manifests of all shapes, with names in order and not, each after each.
+TEST(EntryDigests, NothingOfAnEarlierManifestSurvives) {
+  const std::string manifests[] = {
+      "",
+      Section("a", "1"),
+      Section("b", "2") + Section("c", "3") + Section("a", "4"),
+      Section("a", "5") + Section("b", "6") + Section("c", "7") + Section("longer", "8"),
+      Section("c", "9") + Section("longer", "10") + Section("c", "11") + Section("b", "12") +
+          Section("dd", "13"),
+      "Main: section\r\n\r\n" + Section("dd", "14") + Section("c", "15") + "Key:x"};
+  LogCapture log;
+  for (const std::string& first : manifests) {
+    for (const std::string& second : manifests) {
+      EntryDigests fresh, used;
+      used.Load({first.begin(), first.end()});
+      used.List();
+      for (EntryDigests* digests : {&fresh, &used}) {
+        digests->Load({second.begin(), second.end()});
+        digests->List();
+      }
+      for (const char* name : {"a", "b", "c", "dd", "longer"}) {
+        EXPECT_EQ(Found(fresh, name), Found(used, name)) << first << "then\n" << second;
+      }
+    }
+  }
+}
+
+// What follows the text in memory, and what the table held there before, would do for one more.
+TEST(EntryDigests, NoMoreSectionsAreListedThanThereAre) {
+  const std::string two = Section("a", "1") + Section("b", "2");
+  const std::string whole = two + Section("c", "3");
+  EntryDigests digests;
+  ASSERT_TRUE(digests.Load({whole.begin(), whole.end()}));
+  std::vector<uint8_t> text(whole.begin(), whole.end());
+  text.resize(two.size());
+  ASSERT_TRUE(digests.Load(std::move(text)));
+  digests.List();
+  EXPECT_EQ("SHA-256-Digest 2", Found(digests, "b"));
+  EXPECT_EQ("none", Found(digests, "c"));
+}
+
+TEST(EntryDigests, WhatIsFoundReplacesWhatTheTextsHeld) {
+  const std::string text = Section("a", "1");
+  EntryDigests digests;
+  ASSERT_TRUE(digests.Load({text.begin(), text.end()}));
+  digests.List();
+  std::string digest_name = "SHA1-Digest", digest = "longer than the digest";
+  EXPECT_FALSE(digests.Find("b", digest_name, digest));
+  EXPECT_EQ("SHA1-Digest", digest_name);
+  EXPECT_EQ("longer than the digest", digest);
+  EXPECT_TRUE(digests.Find("a", digest_name, digest));
+  EXPECT_EQ("SHA-256-Digest", digest_name);
+  EXPECT_EQ("1", digest);
 }
 
 TEST(EntryDigests, AManifestThatDoesNotParseIsNotLoaded) {

@@ -292,6 +292,25 @@ TEST(VerifyFileHash, AFileThatCannotBeReadIsReported) {
   EXPECT_EQ(log.records(), Records({Error("Can't open file: /nowhere/libfoo.so\n")}));
 }
 
+// The digest is decoded first, and whether it can be makes no difference to what is read.
+TEST(VerifyFileHash, AFileThatCannotBeReadIsReportedWhateverItsDigest) {
+  for (const char* digest : {"not base64!", "====", "AAAA"}) {
+    OpenPackage open(WithManifest(JarText::Manifest()
+                                      .EndSection()
+                                      .Attribute("Name", kLibrary)
+                                      .Attribute("SHA-256-Digest", digest)
+                                      .EndSection()
+                                      .text()));
+    LogCapture log;
+    struct stat read = {};
+    EXPECT_FALSE(open.apk.VerifyFileHash(kLibrary, "/nowhere/libfoo.so", &read));
+    EXPECT_EQ(log.records(), Records({Error("Can't open file: /nowhere/libfoo.so\n")}));
+    const DiskFile library(ToBytes("\177ELF foo"));
+    EXPECT_FALSE(open.apk.VerifyFileHash(kLibrary, library.path(), &read));
+    EXPECT_NE(read.st_ino, 0u);
+  }
+}
+
 // What is cut off counts as zeros, whatever the file before it held there.
 TEST(VerifyFileHash, AFileThatShrinksMeanwhileEndsInZeros) {
   PackageOptions options;

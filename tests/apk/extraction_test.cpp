@@ -110,6 +110,19 @@ TEST(Extraction, ALongEntryThatLiesLeavesTheVectorAlone) {
   }
 }
 
+// The library's code for data that does not inflate.
+constexpr int32_t kZlibError = -2;
+
+TEST(Extraction, AnEntryThatDoesNotInflateHasTheLibrarysCode) {
+  for (const bool is_long : {false, true}) {
+    ZipItem item = is_long ? LongItem() : ZipItem{"a", Bytes(1000, 0), true};
+    item.raw = Bytes(is_long ? LongItem().raw->size() : 100, 0xFF);
+    OpenEntry zip(item);
+    Bytes out;
+    EXPECT_EQ(ExtractZipEntry(zip.handle, &zip.entry, out), kZlibError);
+  }
+}
+
 TEST(Extraction, ALongEntryThatMemoryCannotHoldLeavesTheVectorAlone) {
   OpenEntry zip(LongItem());
   Bytes out(100, 1);

@@ -82,6 +82,49 @@ TEST(ManifestMf, LoadStartsFromScratch) {
   EXPECT_EQ(Sections({{{"A", "1"}}}), SectionsOf(manifest));
 }
 
+// Texts of different shapes, some of which do not parse, each after each: what one leaves behind
+// would not read right in the other.
+TEST(ManifestMf, NothingOfAnEarlierTextSurvives) {
+  std::string many = "Longer-Name: longer value\r\n\r\n";
+  for (int i = 0; i < 50; ++i) many += "B" + std::to_string(i) + ": 1\r\nC: 2\r\n\r\n";
+  const std::string texts[] = {"",
+                               "Key:\r\n\r\n",
+                               "A: 1\r\n\r\n",
+                               "BB: 22\r\nCCC: 333\r\n\r\nD: 4\r\n\r\n\r\n",
+                               "Unfinished: 1\r\nSection: 2\r\n",
+                               "A: 1\r\n\r\nB: 2\r\nKey:x",
+                               many};
+  LogCapture log;
+  for (const std::string& first : texts) {
+    for (const std::string& second : texts) {
+      ManifestMf fresh, used;
+      const bool parses = fresh.load(second);
+      used.load(first);
+      EXPECT_EQ(parses, used.load(second)) << second;
+      EXPECT_EQ(parses, static_cast<bool>(used)) << second;
+      EXPECT_EQ(SectionsOf(fresh), SectionsOf(used)) << first << " then " << second;
+    }
+  }
+}
+
+// The memory of the text goes on behind it, with bytes that would mean something.
+TEST(ManifestMf, NothingBehindTheTextIsRead) {
+  LogCapture log;
+  const std::string whole = "Name: abcdefghijklm\r\n nopq\r\nKey: 1\r\n\r\nB:\r\n\r\n";
+  for (size_t length = 0; length <= whole.size(); ++length) {
+    ManifestMf expected;
+    const bool parses = expected.load(whole.substr(0, length));
+    for (const char behind : {'\0', '\n', '\r', ' ', ':', 'x'}) {
+      Bytes text(length + 20, static_cast<uint8_t>(behind));
+      std::copy_n(whole.begin(), length, text.begin());
+      text.resize(length);
+      ManifestMf manifest;
+      EXPECT_EQ(parses, manifest.load(std::move(text))) << length << behind;
+      EXPECT_EQ(SectionsOf(expected), SectionsOf(manifest)) << length << behind;
+    }
+  }
+}
+
 TEST(ManifestMf, EmptyTextHasNoSections) { EXPECT_EQ(Sections(), Parse("")); }
 
 TEST(ManifestMf, LineBreaksAndSpacesAloneHaveNoSections) {
@@ -197,6 +240,17 @@ TEST(ManifestMf, ByteAfterAColonIsReportedAsUnsigned) {
 TEST(ManifestMf, NameThatRunsIntoTheEndOfTheTextFails) {
   ExpectNoColon("NoColonHere", "NoColonHere");
   ExpectNoColon("A: 1\r\nNoColonHere\r\n", "NoColonHere\r\n");
+}
+
+// Whole, or as much of it as the log takes: 1024 bytes with a NUL at the end.
+TEST(ManifestMf, NameThatRunsIntoTheEndOfTheTextIsToldAtAnyLength) {
+  const std::string before = "Parse manifest: Error: P_KEY: unexpected end of file after key '";
+  std::string name;
+  for (int i = 0; name.size() < 5000; ++i) name += std::to_string(i) + " ";
+  for (size_t length : {39, 40, 41, 255, 1023 - 67, 1023 - 66, 1023, 1024, 1025, 5000}) {
+    const std::string key = name.substr(0, length);
+    ExpectFault(key, (before + key + "'\n").substr(0, 1023));
+  }
 }
 
 TEST(ManifestMf, NameThatRunsIntoANulFails) {

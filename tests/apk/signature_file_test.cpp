@@ -312,12 +312,17 @@ TEST_F(VerifyData, EmptyDataHasADigest) {
 }
 
 TEST_F(VerifyData, AnyOtherNameIsUnsupported) {
-  for (const char* name : {"", "MD5-Digest", "SHA-512-Digest", "SHA-1-Digest", "sha1-digest",
-                           "SHA1-Digest ", "SHA256-Digest"}) {
-    log_.Clear();
-    EXPECT_FALSE(apk_.VerifyData(name, sha1_, abc_));
-    EXPECT_EQ(log_.records(),
-              Records({Error(std::string("verifyData: Unsupported digest type: ") + name + "\n")}));
+  for (const char* name :
+       {"", "MD5-Digest", "SHA-512-Digest", "SHA-1-Digest", "sha1-digest", "SHA1-Digest ",
+        "SHA256-Digest", "X-SHA1-Digest", "X-SHA-256-Digest", " SHA-256-Digest", "SHA-256-Digest-X",
+        "SHA1-Diges", "SHA-256-Diges", "1-Digest", "256-Digest"}) {
+    for (const Bytes& expected : {sha1_, sha256_}) {
+      log_.Clear();
+      EXPECT_FALSE(apk_.VerifyData(name, expected, abc_));
+      EXPECT_EQ(
+          log_.records(),
+          Records({Error(std::string("verifyData: Unsupported digest type: ") + name + "\n")}));
+    }
   }
 }
 

@@ -8,14 +8,18 @@
 #include <vector>
 
 #include "support/der.h"
+#include "support/guarded_bytes.h"
 
 namespace {
 
-// The bytes in a heap buffer of exactly their size, so that reading past them is caught.
-Bytes Exact(const Bytes& bytes, size_t length) {
-  return Bytes(bytes.begin(), bytes.begin() + static_cast<ptrdiff_t>(length));
+// The first of the bytes, where memory ends, so that reading past them is caught.
+GuardedBytes Cut(const Bytes& bytes, size_t length) {
+  return GuardedBytes(Bytes(bytes.begin(), bytes.begin() + static_cast<ptrdiff_t>(length)));
 }
 
+int Read(const GuardedBytes& bytes, asn1_hdr* hdr) {
+  return asn1_get_next(bytes.data(), bytes.size(), hdr);
+}
 int Read(const Bytes& bytes, asn1_hdr* hdr) {
   return asn1_get_next(bytes.data(), bytes.size(), hdr);
 }
@@ -216,7 +220,7 @@ TEST(Asn1GetNext, NoTruncationOfALongHeaderIsReadPast) {
   asn1_hdr hdr;
   EXPECT_EQ(Read(whole, &hdr), 0);
   for (size_t length = 0; length < whole.size(); ++length) {
-    EXPECT_EQ(Read(Exact(whole, length), &hdr), -1) << length;
+    EXPECT_EQ(Read(Cut(whole, length), &hdr), -1) << length;
     EXPECT_EQ(hdr.payload, nullptr);
   }
 }
@@ -235,7 +239,7 @@ TEST(Asn1GetNextBounded, HeaderMustLieInTheAvailableBytes) {
   asn1_hdr hdr;
   EXPECT_EQ(asn1_get_next_bounded(whole.data(), whole.size(), 100, &hdr), 0);
   for (size_t length = 0; length < whole.size(); ++length) {
-    const Bytes cut = Exact(whole, length);
+    const GuardedBytes cut = Cut(whole, length);
     EXPECT_EQ(asn1_get_next_bounded(cut.data(), cut.size(), 100, &hdr), -1) << length;
     EXPECT_EQ(hdr.payload, nullptr);
   }
@@ -308,7 +312,7 @@ TEST(Asn1ParseOid, EmptyContentsGiveNoArcs) {
 
 TEST(Asn1ParseOid, ContentsThatEndWithinAnArcFail) {
   const Bytes whole = FromHex("2a 86 48");
-  const Bytes cut = Exact(whole, 2);
+  const GuardedBytes cut = Cut(whole, 2);
   asn1_oid oid;
   EXPECT_EQ(asn1_parse_oid(whole.data(), whole.size(), &oid), 0);
   EXPECT_EQ(asn1_parse_oid(cut.data(), cut.size(), &oid), -1);

@@ -2,10 +2,10 @@
 #pragma once
 
 #include <string>
-#include <utility>
 
 #include "crypto/x509.h"
 #include "support/certificate.h"
+#include "support/guarded_bytes.h"
 
 // The signature does not matter to the parser: made up, it costs nothing.
 inline Certificate Unsigned() {
@@ -14,10 +14,9 @@ inline Certificate Unsigned() {
   return certificate;
 }
 
-// Parsed from a heap buffer of exactly the certificate's size, so that reading past it is caught.
+// Parsed where memory ends, so that reading past it is caught.
 struct ParsedCertificate {
-  explicit ParsedCertificate(Bytes der) : bytes(std::move(der)) {
-    bytes.shrink_to_fit();
+  explicit ParsedCertificate(const Bytes& der) : bytes(der) {
     result = x509_certificate_parse(bytes.data(), bytes.size(), &cert);
   }
   explicit ParsedCertificate(const Certificate& certificate)
@@ -25,7 +24,7 @@ struct ParsedCertificate {
   ParsedCertificate(const ParsedCertificate&) = delete;
   ParsedCertificate& operator=(const ParsedCertificate&) = delete;
 
-  Bytes bytes;
+  const GuardedBytes bytes;
   int result;
   x509_certificate cert;
 };

@@ -35,7 +35,7 @@ Bytes BlockEndingInSigners(const Bytes& signers) {
 }
 
 // Whether all that lies in the block according to the record does.
-bool Inside(const Bytes& block, const pkcs7& record) {
+bool Inside(const GuardedBytes& block, const pkcs7& record) {
   const auto inside = [&](const uint8_t* value, size_t length) {
     if (value == nullptr) return length == 0;
     return value >= block.data() && value <= block.data() + block.size() &&
@@ -47,7 +47,7 @@ bool Inside(const Bytes& block, const pkcs7& record) {
 }
 
 // The block, damaged before the call.
-bool StaysInside(const Bytes& block) {
+bool StaysInside(const GuardedBytes& block) {
   pkcs7 record = {};
   const int result = processCert(block.data(), static_cast<uint32_t>(block.size()), &record);
   return (result == 0 || result == 1) && Inside(block, record);
@@ -242,11 +242,12 @@ TEST(ProcessCertBounds, EveryTruncationOfABlockOfIndefiniteLengthsStaysInside) {
 }
 
 TEST(ProcessCertBounds, EveryChangeOfOneByteStaysInside) {
-  Bytes block = WithRsaKey(Bytes(64, 0x77), {3}).Build(kSignatureFile);
-  block.shrink_to_fit();
+  const Bytes whole = WithRsaKey(Bytes(64, 0x77), {3}).Build(kSignatureFile);
+  GuardedBytes block(whole);
   testing::internal::CaptureStdout();
   size_t outside = 0;
-  for (uint8_t& byte : block) {
+  for (size_t i = 0; i < whole.size(); ++i) {
+    uint8_t& byte = block.data()[i];
     const uint8_t good = byte;
     for (const int change : {0x00, 0x01, 0x1f, 0x7f, 0x80, 0x81, 0x82, 0x84, 0xff, good + 1,
                              good - 1, good ^ 0x80, good ^ 0x20}) {
@@ -257,7 +258,7 @@ TEST(ProcessCertBounds, EveryChangeOfOneByteStaysInside) {
   }
   testing::internal::GetCapturedStdout();
   EXPECT_EQ(outside, 0u);
-  EXPECT_EQ(ProcessedBlock(block).result, 0);
+  EXPECT_EQ(ProcessedBlock(whole).result, 0);
 }
 
 TEST(ProcessCert, BlockMadeByOpensslIsRead) {

@@ -272,9 +272,9 @@ TEST(ProcessCertKey, ModulusLosesExactlyOneZero) {
 
 // A modulus of no bytes, which a zero follows, one of a zero, and one of two.
 TEST(ProcessCertKey, EmptyModulusLeavesNoRoomForTheExponent) {
-  for (const auto& [digits, length] :
-       {std::pair("30 03 02 00 00", 0u), std::pair("30 06 02 01 00 02 01 03", 0u),
-        std::pair("30 07 02 02 00 00 02 01 03", 1u)}) {
+  const std::pair<const char*, uint32_t> cases[] = {
+      {"30 03 02 00 00", 0}, {"30 06 02 01 00 02 01 03", 0}, {"30 07 02 02 00 00 02 01 03", 1}};
+  for (const auto& [digits, length] : cases) {
     const ProcessedBlock processed(WithPublicKey(FromHex(digits)));
     EXPECT_EQ(processed.result, 1);
     EXPECT_EQ(processed.output, std::string(kUnreadable) + kKeyTrailer);

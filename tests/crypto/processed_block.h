@@ -5,9 +5,9 @@
 
 #include <cinttypes>
 #include <string>
-#include <utility>
 
 #include "crypto/pkcs7.h"
+#include "support/guarded_bytes.h"
 #include "support/signature_block.h"
 
 // What is printed.
@@ -25,10 +25,9 @@ inline constexpr char kNoAlgorithm[] =
 
 inline const Bytes kSignatureFile = ToBytes("Signature-Version: 1.0\r\n\r\n");
 
-// Read from a heap buffer of exactly its size.
+// Read where memory ends, so that reading past it is caught.
 struct ProcessedBlock {
-  explicit ProcessedBlock(Bytes block) : bytes(std::move(block)) {
-    bytes.shrink_to_fit();
+  explicit ProcessedBlock(const Bytes& block) : bytes(block) {
     testing::internal::CaptureStdout();
     result = processCert(bytes.data(), static_cast<uint32_t>(bytes.size()), &record);
     output = testing::internal::GetCapturedStdout();
@@ -49,7 +48,7 @@ struct ProcessedBlock {
     return line;
   }
 
-  Bytes bytes;
+  const GuardedBytes bytes;
   pkcs7 record = {};
   int result;
   std::string output;

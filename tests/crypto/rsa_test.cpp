@@ -5,13 +5,13 @@
 #include <openssl/nid.h>
 
 #include <algorithm>
-#include <memory>
 #include <string>
 #include <tuple>
 #include <vector>
 
 #include "support/der.h"
 #include "support/failing_malloc.h"
+#include "support/guarded_bytes.h"
 #include "support/log_capture.h"
 #include "support/rsa_keys.h"
 
@@ -177,6 +177,18 @@ TEST(RsaPkcs1Verify, EveryByteOfThePaddingCounts) {
   LogCapture log;
   for (size_t i = 1; i <= separator; ++i) {
     EXPECT_EQ(7, Verify(key.context, key.SignBlock(Flipped(block, i)))) << i;
+  }
+  EXPECT_EQ(log.records(), kNoRecords);
+}
+
+// RFC 2313 §8.1 has the types 0 and 2 as well, of encryption and of the private key's operation.
+TEST(RsaPkcs1Verify, BlockOfAnotherTypeThan1IsInvalidPadding) {
+  const FixedKey key("rsa-1024");
+  LogCapture log;
+  Bytes block = Block(128, kSha256Info);
+  for (int type = 0; type < 256; ++type) {
+    block[1] = static_cast<uint8_t>(type);
+    EXPECT_EQ(type == 1 ? 0 : 7, Verify(key.context, key.SignBlock(block))) << type;
   }
   EXPECT_EQ(log.records(), kNoRecords);
 }
@@ -440,18 +452,19 @@ TEST(RsaSetKey, ReadsTheExponentValueAsASignedNumber) {
 // The exponent's buffer ends where it must not be read further.
 TEST(RsaSetKey, ReadsExactlyAsManyBytesOfTheExponentAsTheModulusHas) {
   const FixedKey key("rsa-1024");
-  const auto exponent = std::make_unique<uint8_t[]>(128);
-  exponent[125] = 1;
-  exponent[127] = 1;
+  Bytes bytes(128, 0);
+  bytes[125] = 1;
+  bytes[127] = 1;
+  GuardedBytes exponent(bytes);
   rsa_local context;
-  EXPECT_EQ(0, rsa_set_key(&context, key.modulus.data(), exponent.get(), 3, 128));
+  EXPECT_EQ(0, rsa_set_key(&context, key.modulus.data(), exponent.data(), 3, 128));
   ASSERT_EQ(1, context.E.n);
   EXPECT_EQ(65537u, context.E.p[0]);
   EXPECT_EQ(0, Verify(context, key.Sign(NID_sha256, kSha256)));
   mpi_free(&context.N, &context.E, nullptr);
 
-  exponent[0] = 0x80;
-  EXPECT_EQ(0, rsa_set_key(&context, key.modulus.data(), exponent.get(), 3, 128));
+  exponent.data()[0] = 0x80;
+  EXPECT_EQ(0, rsa_set_key(&context, key.modulus.data(), exponent.data(), 3, 128));
   EXPECT_EQ(1024, mpi_msb(&context.E));
 }
 

@@ -95,6 +95,27 @@ TEST(X509RunningOn, ElementsOfANameAreMinus12) {
   }
 }
 
+// What the element takes is all there, and belongs to what holds its container.
+TEST(X509RunningOn, ElementsOfANameMayNotTakeWhatFollowsTheirContainer) {
+  const Bytes type = der::Oid(kCommonName);
+  const Bytes attribute = der::Sequence({type, Value()});
+  const Bytes rdn = der::Set({attribute});
+  ASSERT_EQ(ResultOf(WithSubject(der::Sequence({rdn, rdn}))), 0);
+  const Bytes cases[] = {
+      // an attribute that takes the SET behind its own
+      der::Sequence({der::Set({RunningOn(attribute, rdn.size())}), rdn}),
+      // a value that takes the SET behind its own
+      der::Sequence({der::Set({der::Sequence({type, RunningOn(Value(), rdn.size())})}), rdn}),
+      // a value behind its SEQUENCE, in the SET
+      der::Sequence({der::Set({der::Sequence({type}), Value()})}),
+      // a type behind its SEQUENCE, in the SET
+      der::Sequence({der::Set({der::Sequence({}), type, Value()})}),
+      // a SEQUENCE behind its SET, in the name
+      der::Sequence({der::Set({}), attribute}),
+  };
+  for (const Bytes& name : cases) EXPECT_EQ(ResultOf(WithSubject(name)), -12);
+}
+
 // The time is short of two bytes, and the subject, of 90 bytes, begins 30 5a: the text "0Z".
 TEST(X509RunningOn, TimeIsMinus13) {
   Certificate certificate = WithSubject(Name({{kCommonName, std::string(79, 'x')}}));
@@ -118,6 +139,22 @@ TEST(X509RunningOn, KeyIsMinus14) {
   EXPECT_EQ(ResultOf(certificate), -14);
   certificate.public_key_info = der::Sequence({RunningOn(algorithm, key.size()), key});
   EXPECT_EQ(ResultOf(certificate), -14);
+}
+
+// All of it lies in the tbsCertificate, but not in the SEQUENCE that should hold it.
+TEST(X509RunningOn, KeyBehindItsInfoIsMinus14) {
+  const Bytes algorithm = AlgorithmIdentifier("1.2.3");
+  const Bytes key = der::BitString({1, 2, 3});
+  const Bytes cases[] = {
+      Concat({der::Sequence({algorithm}), key}),
+      der::Sequence({der::Sequence({}), der::Oid("1.2.3"), key}),
+      Concat({der::Sequence({algorithm, RunningOn(key, key.size())}), key}),
+  };
+  for (const Bytes& info : cases) {
+    Certificate certificate = Unsigned();
+    certificate.public_key_info = info;
+    EXPECT_EQ(ResultOf(certificate), -14);
+  }
 }
 
 // What follows the [3] is an Extension, too.

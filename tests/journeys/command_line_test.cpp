@@ -85,10 +85,13 @@ TEST_F(CommandLine, FileOnTheSameFileSystemWritableIsWorkedOn) {
 }
 
 // The log as the workstation's library prints it, less the time and the process: a letter for the
-// priority, then the text.
+// priority, then the text. The library puts the tag before the time up to level 29, and after it
+// later.
 std::string WorkstationLog(const std::string& errors) {
+  const std::string when = "[0-9]+-[0-9]+ [0-9:.]+ +[0-9]+ +[0-9]+ ";
   return std::regex_replace(
-      errors, std::regex("ApkToolkit ([A-Z]) [0-9]+-[0-9]+ [0-9:]+ +[0-9]+ +[0-9]+ "), "$1 ");
+      errors, std::regex("ApkToolkit ([A-Z]) " + when + "|" + when + "([A-Z]) ApkToolkit: "),
+      "$1$2 ");
 }
 
 TEST_F(CommandLine, WithoutASimulatedPhoneNothingCanBeSigned) {

@@ -1,7 +1,9 @@
 // JARs, which the kernel has to trust already, and other files that are no packages.
+#include <fcntl.h>
 #include <gtest/gtest.h>
 #include <openssl/sha.h>
 #include <sys/xattr.h>
+#include <ziparchive/zip_archive.h>
 
 #include <cerrno>
 #include <cstring>
@@ -246,12 +248,24 @@ TEST(OtherFile, WithTheAttributeButNoArchiveIsNotRegistered) {
   EXPECT_EQ(run.status, 1);
 }
 
+// The zip library's result for a file that it does not open, as the tool writes it: "CODE: TEXT".
+std::string ZipRefusal(const std::string& path) {
+  const int fd = open(path.c_str(), O_RDONLY | O_CLOEXEC);
+  ZipArchiveHandle archive = nullptr;
+  const int32_t result = OpenArchiveFd(fd, "", &archive);
+  CloseArchive(archive);
+  return std::to_string(result) + ": " + ErrorCodeString(result);
+}
+
+// No library opens one, and each has another code for it.
 TEST(OtherFile, ThatIsADirectoryIsRefusedByEachStep) {
   const TempDir folder;
+  const std::string refusal = ZipRefusal(folder.path());
+  ASSERT_EQ(refusal[0], '-');
 
   const Simulation run = Simulate(folder.path());
 
-  EXPECT_EQ(run.timeline, NotAnArchive(folder.path(), "-3: Invalid file"));
+  EXPECT_EQ(run.timeline, NotAnArchive(folder.path(), refusal));
   EXPECT_EQ(run.status, 1);
 }
 

@@ -88,14 +88,13 @@ TEST_F(Reason, SignedByJarsigner) {
 
 TEST_F(Reason, CertificateThatAnAuthorityIssued) {
   Take("openssl-cms-issued");
-  EXPECT_EQ(Told(3),
+  EXPECT_EQ(Told(4),
             Lines({"REFUSED  base.apk" + By("rsa-2048-other", "RSA-2048, key 03e5e653…57c52a"),
                    "  ✗ package                not signed: its certificate was issued by "
                    "another (CN=rsa-2048, O=Example), and this tool takes self-signed "
                    "ones alone",
-                   "      Sign it with a self-signed certificate, which keytool "
-                   "-genkeypair makes.",
-                   "-> 1"}));
+                   "      Sign it with a self-signed certificate: keytool -genkeypair -keyalg RSA",
+                   "      -sigalg SHA256withRSA.", "-> 1"}));
 }
 
 TEST_F(Reason, EcKey) {
@@ -114,16 +113,19 @@ TEST_F(Reason, KeyOfMoreThan4096Bits) {
                             "      Sign it with an RSA key of 2048 to 4096 bits.", "-> 1"}));
 }
 
-// keytool signs the certificate of a larger key with SHA-384 by itself; what the cure says helps.
+// Every keytool signs the certificate of a key of this size with SHA-384 unless it is told
+// otherwise, and what the cure says helps.
 TEST_F(Reason, CertificateSignedWithALongerDigest) {
   Take("keytool-sha384");
   const Lines told = Told(5);
-  EXPECT_EQ(Lines(told.begin() + 1, told.end()),
-            Lines({"  ✗ package                not signed: its certificate is signed with "
-                   "SHA384withRSA, and this tool reads MD5, SHA-1 and SHA-256 with RSA",
-                   "      Make a certificate for the same key with SHA-256: keytool -selfcert",
-                   "      -sigalg SHA256withRSA. keytool takes SHA-384 by itself for keys of more",
-                   "      than 3072 bits.", "-> 1"}));
+  EXPECT_EQ(
+      Lines(told.begin() + 1, told.end()),
+      Lines({"  ✗ package                not signed: its certificate is signed with "
+             "SHA384withRSA, and this tool reads MD5, SHA-1 and SHA-256 with RSA",
+             "      Make a certificate for the same key with SHA-256: keytool -selfcert",
+             "      -sigalg SHA256withRSA. Without -sigalg keytool takes SHA-384: that of JDK",
+             "      21 for every RSA key, that of JDK 17 for keys of more than 3072 bits.",
+             "-> 1"}));
   EXPECT_EQ(FirstLines(0, {"base.apk"}, {{}, std::string(GOLDEN_PACKAGES) + "/keytool-sha256"}),
             Lines({"-> 0"}));
 }

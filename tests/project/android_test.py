@@ -25,7 +25,7 @@ OWN = "int Own() { return 1; }"
 def compiled(folder, name, text):
     source, built = folder / f"{name}.cpp", folder / f"{name}.o"
     source.write_text('extern "C" {\n' + text + "\n}\n")
-    subprocess.run(["clang++-14", "--target=aarch64-linux-android27", "-c", source, "-o", built],
+    subprocess.run(["clang++", "--target=aarch64-linux-android27", "-c", source, "-o", built],
                    check=True)
     return built
 

@@ -2,6 +2,7 @@
 """Holds the platform's build against CMake's: the file lists of both, which are also held against the
 folders, what the linker wraps for a test, and what a blueprint may say in a tree of Android 8.1."""
 
+import json
 import pathlib
 import re
 import sys
@@ -34,8 +35,9 @@ KNOWN_PROPERTIES = {"cflags", "compile_multilib", "cpp_std", "data", "defaults",
                     "export_include_dirs", "init_rc", "ldflags", "local_include_dirs", "name", "shared_libs",
                     "srcs", "static_libs"}
 
-# For headers that are the system's here and the user's there.
-PLATFORM_ONLY_FLAGS = {"-Wno-sign-conversion"}
+# The first is for headers that are the system's here and the user's there. For the second, the
+# developers' presets use a variable of CMake's own.
+PLATFORM_ONLY_FLAGS = {"-Wno-sign-conversion", "-Werror"}
 
 
 def main():
@@ -89,6 +91,10 @@ def hold_flags(platform, problems):
     warnings = {flag for text in lists for flag in text.split() if flag.startswith("-W")}
     flags = set(platform.module("apktoolkit_defaults")["cflags"])
     compare("warnings", flags ^ PLATFORM_ONLY_FLAGS, warnings, problems)
+    presets = json.loads((ROOT / "CMakePresets.json").read_text())["configurePresets"]
+    base = next(preset for preset in presets if preset["name"] == "base")
+    if base["cacheVariables"].get("CMAKE_COMPILE_WARNING_AS_ERROR") != "ON":
+        problems.append("warnings are no errors in the developers' presets")
 
 
 def hold_wraps(tests, problems):

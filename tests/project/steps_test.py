@@ -2,6 +2,7 @@
 """Holds the steps of scripts/check against what the papers say of them, and has scripts/check run
 steps that pass, fail and skip."""
 
+import os
 import pathlib
 import re
 import shutil
@@ -100,6 +101,14 @@ def run_problems():
             problems.append(f"scripts/check does not pass: {found}")
         if (found := check(folder, "arrow"))[1] != 2:
             problems.append(f"scripts/check takes a step that there is not: {found}")
+        write(folder / "scripts/bare-system", "echo on its way; echo skipped: no root; exit 77")
+        skipped = ["debian13      skipped: no root (N s, build/logs/debian13.log)"]
+        found = check(folder, "debian13", "arrows")
+        if found != (skipped + expected[0][:1] + ["steps: 1 passed, 0 failed, 1 skipped"], 0):
+            problems.append(f"scripts/check takes a skipped step for another: {found}")
+        found = check(folder, "debian13")
+        if found != (skipped + ["steps: 0 passed, 0 failed, 1 skipped"], 1):
+            problems.append(f"scripts/check passes where no step ran: {found}")
         write(folder / "scripts/setup", "exit 1")
         if (found := check(folder, "arrows"))[1] == 0:
             problems.append(f"scripts/check goes on without its packages: {found}")
@@ -119,5 +128,24 @@ def emulator_problems():
         return [] if found == expected else [f"scripts/kernel without qemu ends with {found}"]
 
 
+def skip_problems():
+    """scripts/bare-system says why it cannot be run here, and by its status that it was not."""
+    with tempfile.TemporaryDirectory() as name:
+        folder = pathlib.Path(name)
+        (folder / "scripts").mkdir()
+        shutil.copy(ROOT / "scripts/bare-system", folder / "scripts")
+        write(folder / "wget", "exit 4")
+        reasons = [("exit 1", "debootstrap is not there, and cannot be installed"),
+                   ("true", "there is no http://mirror.invalid/debian/dists/trixie/Release to be had")]
+        for setup, reason in reasons:
+            write(folder / "scripts/setup", setup)
+            expected = reason if os.geteuid() == 0 else "a bare system can be made by root alone"
+            run = subprocess.run([folder / "scripts/bare-system", "13"], capture_output=True, text=True,
+                                 env={**os.environ, "PATH": f"{folder}:{os.environ['PATH']}",
+                                      "DEBIAN_MIRROR": "http://mirror.invalid/debian"}, check=False)
+            if (run.returncode, run.stdout) != (77, f"skipped: {expected}\n"):
+                yield f"scripts/bare-system ends with {run.returncode}: {run.stdout}{run.stderr}"
+
+
 if __name__ == "__main__":
-    sys.exit(report(list_problems() + setup_problems() + run_problems() + emulator_problems()))
+    sys.exit(report(list_problems() + setup_problems() + run_problems() + emulator_problems() + list(skip_problems())))

@@ -19,6 +19,17 @@ Package BadPackage() {
   return package;
 }
 
+// The library that the walk over the package begins with.
+std::string FirstOf(ApkTools::Apk& apk) {
+  void* cookie = nullptr;
+  EXPECT_EQ(apk.StartIteration(&cookie, "lib/", ".so"), 0);
+  ZipEntry entry;
+  std::string name;
+  EXPECT_EQ(apk.Next(cookie, &entry, name), 0);
+  apk.EndIteration(cookie);
+  return name;
+}
+
 LogRecord SignStarts(int fd) {
   const std::string text = std::to_string(fd);
   return Info("VeltSign starts: zip_fd = " + text + ", fd = " + text + ".\n");
@@ -197,6 +208,24 @@ TEST(VeltSignJni, AnEntryOfNoRowIsPassedOverWithoutAMessage) {
   EXPECT_EQ(file.SignJni(), 0U);
   EXPECT_EQ(file.phone.events, Events());
   EXPECT_EQ(file.log.records(), Records({Starts(file.fd()), Finished()}));
+}
+
+// The order of the two is the zip library's, which goes by their names.
+TEST(VeltSignJni, ALibraryOfAnotherAbiEndsNothingWhicheverIsWalkedFirst) {
+  const ZipItem library = Library("lib/arm64-v8a/libfoo.so");
+  int first = 0, last = 0;  // how often the other was
+  for (int i = 0; i < 100 && (first == 0 || last == 0); ++i) {
+    const ZipItem other = Library("lib/x86/lib" + std::to_string(i) + ".so");
+    PackageOnPhone file(MakePackage(WithLibraries({library, other})));
+    file.Install("lib/arm64/libfoo.so", library);
+    ++(FirstOf(file.apk()) == other.name ? first : last);
+    EXPECT_EQ(file.SignJni(), 0U);
+    EXPECT_EQ(file.phone.events, Events({kSelf, SignEvent(file.fd() + 1)}));
+    EXPECT_EQ(file.log.records(),
+              Records({Starts(file.fd()), Info("VeltSignOat: Apk case.\n"), Finished()}));
+  }
+  EXPECT_GT(first, 0);
+  EXPECT_GT(last, 0);
 }
 
 // Signs the entry when it lies at `installed`; true when the kernel was asked to sign it.

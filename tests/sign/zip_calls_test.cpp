@@ -2,6 +2,9 @@
 // tool here (CMakeLists.txt names them as the compiler does) and they go on to the library.
 #include <gtest/gtest.h>
 
+#include <algorithm>
+#include <vector>
+
 #include "apk/zip_library.h"
 #include "sign/signing.h"
 #include "support/log_capture.h"
@@ -12,11 +15,14 @@ using ApkTools::Apk;
 
 namespace {
 
+constexpr int32_t kInvalidHandle = -4;  // the library's
+
 struct ZipCalls {
   std::vector<bool> ownership;       // of the descriptors that archives were opened on
   std::vector<std::string> filters;  // "PREFIX SUFFIX" of each iteration that was started
   std::vector<void*> archives;       // and the archive that it was started on
   std::vector<void*> open_cookies;   // of iterations that were started and not ended
+  bool no_iteration = false;         // none can be started, though there is an archive
 } calls;
 
 template <typename Filter>
@@ -56,6 +62,7 @@ int32_t WrapOpenArchiveFd(int fd, const char* name, ZipArchiveHandle* handle, bo
 int32_t WrapStartIteration(ZipArchiveHandle archive, void** cookie, Filter prefix, Filter suffix) {
   calls.archives.push_back(archive);
   calls.filters.push_back(TextOf(prefix) + " " + TextOf(suffix));
+  if (calls.no_iteration) return kInvalidHandle;
   const int32_t result = RealStartIteration(archive, cookie, prefix, suffix);
   if (result == 0) calls.open_cookies.push_back(*cookie);
   return result;
@@ -108,6 +115,26 @@ TEST_F(ZipCallsTest, TheSignatureFileAndTheLibrariesAreWalkedToAndTheWalksEnded)
   VeltSignJni(open.apk, open.file.fd(), "not used");
   EXPECT_EQ(calls.filters, std::vector<std::string>({"META-INF/ .SF", "lib/ .so"}));
   EXPECT_EQ(calls.open_cookies, std::vector<void*>());
+}
+
+TEST_F(ZipCallsTest, WithoutAWalkNoLibraryIsSignedAndTheResultIsTheSame) {
+  OpenPackage open(WithLibraries({{"lib/arm64-v8a/libfoo.so", ToBytes("foo")}}));
+  calls.no_iteration = true;
+  log_.Clear();
+  EXPECT_EQ(VeltSignJni(open.apk, 7, "not used"), 0u);
+  EXPECT_EQ(log_.records(),
+            Records({Info("VeltSignJni starts: 7.\n"), Info("VeltSignJni finished: 0.\n")}));
+  EXPECT_EQ(phone_.events, std::vector<std::string>());
+  EXPECT_EQ(calls.filters.back(), "lib/ .so");
+}
+
+TEST_F(ZipCallsTest, WithoutAWalkThereIsNoSignatureFile) {
+  const Package package = MakePackage();
+  calls.no_iteration = true;
+  OpenPackage open(package);
+  EXPECT_TRUE(open.apk.IsApk());
+  EXPECT_FALSE(open.apk.IsGoodApk());
+  EXPECT_EQ(log_.records(), Records());
 }
 
 TEST_F(ZipCallsTest, AWalkThatFindsNothingIsEndedAllTheSame) {

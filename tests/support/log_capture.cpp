@@ -10,7 +10,12 @@
 #include "util/log.h"
 
 namespace {
+
 LogCapture* current = nullptr;
+
+// Some records of the platform's zip library have no tag.
+bool IsTools(const char* tag) { return tag != nullptr && std::string(tag) == kLogTag; }
+
 }  // namespace
 
 bool operator==(const LogRecord& a, const LogRecord& b) {
@@ -25,8 +30,7 @@ LogCapture::LogCapture() { current = this; }
 LogCapture::~LogCapture() { current = nullptr; }
 
 void KeepLogRecord(int priority, const char* tag, const std::string& text) {
-  if (current != nullptr && std::string(tag) == kLogTag)
-    current->records_.push_back({priority, text});
+  if (current != nullptr && IsTools(tag)) current->records_.push_back({priority, text});
 }
 
 extern "C" int __android_log_print(int priority, const char* tag, const char* format, ...) {
@@ -36,6 +40,6 @@ extern "C" int __android_log_print(int priority, const char* tag, const char* fo
   const int length = vsnprintf(text, sizeof(text), format, arguments);
   va_end(arguments);
   KeepLogRecord(priority, tag, text);
-  if (std::string(tag) == kLogTag) errno = EDOM;  // a log may change it, and its caller must not
+  if (IsTools(tag)) errno = EDOM;  // a log may change it, and its caller must not
   return length;
 }

@@ -25,7 +25,7 @@ put_android_manifest() {
 }
 
 compile_library() {  # TARGET LIBRARY
-  clang-14 -target "$1" -shared -fPIC -O2 -nostdlib -fuse-ld=lld -o "$2" \
+  clang -target "$1" -shared -fPIC -O2 -nostdlib -fuse-ld=lld -o "$2" \
     "$recipes_dir/vault/vault.c"
 }
 

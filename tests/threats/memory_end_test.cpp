@@ -1,8 +1,10 @@
-// Documents at the very end of memory, for the platform's own parser: what it reads beyond them
-// ends the test.
+// Documents and manifests at the very end of memory: what the platform's parser, or the tool's own,
+// reads beyond them ends the test.
 #include <gtest/gtest.h>
 
 #include "apk/apk.h"
+#include "apk/entry_digests.h"
+#include "apk/manifest_mf.h"
 #include "support/compiled_manifest.h"
 #include "support/log_capture.h"
 #include "support/memory_end.h"
@@ -76,6 +78,63 @@ TEST(CompiledManifestAtMemoryEnd, WithoutRoomForAHeaderIsNone) {
     EXPECT_EQ(log.records(), Records({Error("ParseAndroidManifest failed to init xml parser, "
                                             "error=0x80000001\n")}))
         << size;
+  }
+}
+
+// The table that the sections are sorted in has a hash and a number for each.
+TEST(EntryDigestsAtMemoryEnd, AreSortedWithoutOneMore) {
+  constexpr size_t kSections = 33;
+  std::string text;
+  for (size_t i = kSections; i > 0; --i) {
+    text +=
+        "Name: " + std::to_string(50 + i) + "\r\nSHA1-Digest: " + std::to_string(i) + "\r\n\r\n";
+  }
+  ApkTools::EntryDigests digests;
+  ASSERT_TRUE(digests.Load({text.begin(), text.end()}));
+  PutNextBlockAtMemoryEnd(sizeof(std::pair<size_t, uint32_t>) * kSections);
+  digests.List();
+  EXPECT_TRUE(WasPutAtMemoryEnd());
+  std::string digest_name, digest;
+  EXPECT_TRUE(digests.Find("83", digest_name, digest));
+  EXPECT_EQ(digest, "33");
+  EXPECT_TRUE(digests.Find("51", digest_name, digest));
+  EXPECT_EQ(digest, "1");
+}
+
+// A table that is full when it is put in order, at the 33rd attribute, whose name is the first to
+// begin 1024 bytes into the text.
+TEST(ManifestSectionsAtMemoryEnd, AreNotReadBeyondTheLastAttribute) {
+  constexpr uint32_t kAttributes = 33;
+  std::string text;
+  for (uint32_t i = kAttributes; i > 0; --i) text += std::to_string(50 + i) + std::string(30, 'v');
+  ASSERT_EQ(text.size(), 32 * kAttributes);
+  ManifestSections sections;
+  PutNextBlockAtMemoryEnd(sizeof(ManifestAttribute) * kAttributes);
+  sections.reset(reinterpret_cast<const uint8_t*>(text.data()), text.size());
+  ASSERT_TRUE(WasPutAtMemoryEnd());
+  for (uint32_t i = 0; i < kAttributes; ++i) sections.add({{32 * i, 2}, {32 * i + 2, 30}});
+  sections.endSection();
+  ASSERT_EQ(sections[0].size(), kAttributes);
+  EXPECT_EQ(sections[0][0].first, "51");
+  EXPECT_EQ(sections[0].find("83"), std::string(30, 'v'));
+}
+
+// Names and values of all lengths below that of the eight bytes which are read at once, whole or
+// cut anywhere. A block ends where memory does if its size is a multiple of 4.
+TEST(JarManifestAtMemoryEnd, IsNotReadBeyondWhereverItEnds) {
+  for (size_t length = 1; length < 20; ++length) {
+    const std::string run(length, 'v');
+    const std::string whole = run + ": " + run + "\r\n " + run + "\r\nKey:\r\n " + run + "\r\n\r\n";
+    for (size_t size = 4; size <= whole.size(); size += 4) {
+      LogCapture log;
+      ManifestMf expected, manifest;
+      const bool parses = expected.load(whole.substr(0, size));
+      PutNextBlockAtMemoryEnd(size);
+      Bytes text(whole.begin(), whole.begin() + static_cast<ptrdiff_t>(size));
+      EXPECT_TRUE(WasPutAtMemoryEnd());
+      EXPECT_EQ(parses, manifest.load(std::move(text)));
+      EXPECT_EQ(expected.getSections().size(), manifest.getSections().size());
+    }
   }
 }
 

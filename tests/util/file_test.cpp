@@ -221,6 +221,16 @@ TEST_F(ReadFileTest, FileThatCannotBeRewoundHasNoSize) {
   ExpectNoSize(MakeFile("abc"));
 }
 
+// As of a file that grows or shrinks between the two questions.
+TEST_F(ReadFileTest, SizeIsWhereTheFileEndsAndNotWhatItsStateSays) {
+  for (const off_t end : {off_t{2}, off_t{5}}) {
+    kernel.lseek = [end](int whence) { return whence == SEEK_END ? end : off_t{0}; };
+    Bytes out;
+    EXPECT_TRUE(ReadFile(MakeFile("abc"), out));
+    EXPECT_EQ(end == 2 ? ToBytes("ab") : Bytes({'a', 'b', 'c', 0, 0}), out);
+  }
+}
+
 TEST_F(ReadFileTest, FileThatShrinksMeanwhileIsTrueAndEndsInZeros) {
   const std::string path = MakeFile("abcdef");
   kernel.read = [&](int fd, void* buffer, size_t size) {

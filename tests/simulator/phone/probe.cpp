@@ -2,7 +2,6 @@
 // came of each. A line is a command and its words; what comes of it is "RESULT ERRNO" where errno
 // was 77 before. Memory that cannot be read is named "null", "wild" or "cut" (a payload that runs
 // on into an unmapped page) in place of a payload's digits.
-#include <android/log.h>
 #include <fcntl.h>
 #include <sys/mman.h>
 #include <sys/resource.h>
@@ -21,6 +20,7 @@
 #include <vector>
 
 #include "sign/libzu.h"
+#include "simulator/phone/log_library.h"
 
 // What fcntl becomes in programs that are built for large files.
 extern "C" int fcntl64(int, int, ...);
@@ -130,8 +130,7 @@ const std::map<std::string, Command> kCommands = {
      }},
     {"log-data",
      [](const Words& w) {
-       __android_logger_data data = {sizeof(data), 0, Int(w[1]), w[2].c_str(), nullptr, 0};
-       __android_log_write_logger_data(&data, FromHex(w[3]).c_str());
+       WriteLogRecord(Int(w[1]), w[2].c_str(), FromHex(w[3]).c_str());
        return 0;
      }},
     {"log-assert",

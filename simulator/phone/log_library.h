@@ -1,0 +1,43 @@
+// The platform's log library, as the simulator stands in for it.
+//
+// Two generations of it are in use: up to API level 29 a writer hands a record over as an
+// `__android_logger_data` with the text beside it, later as an `__android_log_message` with the
+// text inside. Only this file sees the difference. Texts and records belong to the caller, and are
+// read during the call alone.
+#pragma once
+
+#include <android/log.h>
+
+#include <type_traits>
+
+// Each is defined by one of the generations alone.
+struct __android_logger_data;
+struct __android_log_message;
+
+template <typename Record, typename = void>
+inline constexpr bool kLogLibraryHas = false;
+template <typename Record>
+inline constexpr bool kLogLibraryHas<Record, std::void_t<decltype(sizeof(Record))>> = true;
+
+// Calls `write(priority, tag, text)` with what a record of either generation holds; not at all with
+// one that the library at hand does not have, since nothing can hold anything then.
+template <typename Data, typename Write>
+void ReadLogRecord(const Data* data, const char* text, Write write) {
+  if constexpr (kLogLibraryHas<Data>) write(data->priority, data->tag, text);
+}
+template <typename Message, typename Write>
+void ReadLogRecord(const Message* message, Write write) {
+  if constexpr (kLogLibraryHas<Message>) write(message->priority, message->tag, message->message);
+}
+
+// Writes a record as the platform's C++ libraries do.
+template <typename Data = __android_logger_data, typename Message = __android_log_message>
+void WriteLogRecord(int priority, const char* tag, const char* text) {
+  if constexpr (kLogLibraryHas<Message>) {
+    Message message = {sizeof(message), LOG_ID_MAIN, priority, tag, nullptr, 0, text};
+    __android_log_write_log_message(&message);
+  } else {
+    Data data = {sizeof(data), LOG_ID_MAIN, priority, tag, nullptr, 0};
+    __android_log_write_logger_data(&data, text);
+  }
+}

@@ -1,0 +1,77 @@
+#!/usr/bin/env python3
+"""Has scripts/check-binary look at programs that lack one part of the hardening each.
+
+Argument: the compiler.
+"""
+
+import pathlib
+import subprocess
+import sys
+import tempfile
+
+from sources import ROOT, report
+
+# Something for each part: a buffer on the stack, and a call whose room is known.
+SOURCE = """#include <stdio.h>
+#include <string.h>
+int main(int count, char** words) {
+  char text[100];
+  memcpy(text, words[0], (size_t)count);
+  puts(text);
+  return 0;
+}
+"""
+
+GOOD = {"bind": "-Wl,-z,now", "table": "-Wl,-z,relro", "place": "-pie -fPIE",
+        "stack": "-fstack-protector-strong", "calls": "-D_FORTIFY_SOURCE=2", "heap": "-O2"}
+
+# In place of a part, and what is said of it.
+BAD = [("bind", "-Wl,-z,lazy", "binds its symbols when they are called"),
+       ("table", "-Wl,-z,norelro", "can be written"),
+       ("place", "-no-pie -fno-pie", "lies where it was linked to"),
+       ("stack", "-fno-stack-protector", "no stack is protected"),
+       ("calls", "-U_FORTIFY_SOURCE", "no call is checked"),
+       ("heap", "-O2 -Wl,-z,execstack", "can be executed")]
+
+
+def compiled(compiler, folder, parts, *more):
+    (folder / "source.cpp").write_text(SOURCE)
+    flags = " ".join(parts.values()).split()
+    subprocess.run([compiler, *flags, *more, "source.cpp", "-o", "made"], cwd=folder, check=True)
+    return folder / "made"
+
+
+def check(*files):
+    return subprocess.run([ROOT / "scripts/check-binary", "hardened", *files], text=True,
+                          stdout=subprocess.PIPE, stderr=subprocess.STDOUT, check=False)
+
+
+def main():
+    compiler = sys.argv[1]
+    arm = subprocess.run([compiler, "-dumpmachine"], check=True, text=True,
+                         capture_output=True).stdout.startswith("aarch64")
+    problems = []
+    with tempfile.TemporaryDirectory() as name:
+        folder = pathlib.Path(name)
+        result = check(compiled(compiler, folder, GOOD))
+        if result.returncode != 0 or "hardened: made\n" not in result.stdout:
+            problems.append(f"a hardened program is refused: {result.stdout}")
+        for part, instead, message in BAD:
+            result = check(compiled(compiler, folder, {**GOOD, part: instead}))
+            if result.returncode != 1 or message not in result.stdout:
+                problems.append(f"{instead} is not noticed: {result.stdout}")
+        if arm:
+            branches = {**GOOD, "branches": "-mbranch-protection=standard"}
+            if (result := check(compiled(compiler, folder, branches, "-c"))).returncode != 0:
+                problems.append(f"a hardened object is refused: {result.stdout}")
+            result = check(compiled(compiler, folder, GOOD, "-c"))
+            if result.returncode != 1 or "0 of 1 objects" not in result.stdout:
+                problems.append(f"unprotected branches are not noticed: {result.stdout}")
+        for files in ((), (folder / "missing",)):
+            if check(*files).returncode == 0:
+                problems.append(f"{files} are taken for hardened files")
+    return report(problems)
+
+
+if __name__ == "__main__":
+    sys.exit(main())

@@ -1,0 +1,62 @@
+#!/usr/bin/env python3
+"""Runs every command that makes a key on README.md, in docs/guide.md and on the manual page: its
+certificate is signed with SHA-256. What the pages say of the JDKs' own choice is held against the JDK
+that is installed, as far as it is one of those.
+"""
+
+import re
+import subprocess
+import sys
+import tempfile
+
+from sources import ROOT, report
+
+PAGES = ("README.md", "docs/guide.md", "man/apktoolkit.1")
+COMMAND = re.compile(r"keytool -genkeypair (?:.*\\\n)*.*")
+OWN_CHOICE = {17: {"3072": "sha256WithRSAEncryption", "3073": "sha384WithRSAEncryption"},
+              21: {"2048": "sha384WithRSAEncryption"}}
+
+
+def shown_commands(page):
+    """The page's commands, each on one line; in a manual page, a backslash is written as \\e."""
+    text = (ROOT / page).read_text().replace("\\e\n", "\\\n")
+    return [re.sub(r"\\\n\s*", "", command) for command in COMMAND.findall(text)]
+
+
+def signature_algorithm(command):
+    """That of the certificate which the command makes, as openssl tells it."""
+    with tempfile.TemporaryDirectory() as folder:
+        run = subprocess.run(["bash", "-c", f"{command} -dname CN=Example -storepass android && "
+                              "openssl pkcs12 -in release.p12 -passin pass:android -nokeys |"
+                              "openssl x509 -noout -text"],
+                             cwd=folder, capture_output=True, text=True, check=False)
+    found = re.search(r"Signature Algorithm: (\w+)", run.stdout)
+    return found[1] if found else run.stdout + run.stderr
+
+
+def page_problems():
+    problems = []
+    for page in PAGES:
+        commands = shown_commands(page)
+        if not commands:
+            problems.append(f"{page} shows no command that makes a key")
+        for command in commands:
+            # These two are asked for when they are not given, and given once only.
+            command = re.sub(r" -(dname|storepass) \S+| 2>.*", "", command)
+            if (found := signature_algorithm(command)) != "sha256WithRSAEncryption":
+                problems.append(f"{page}: the certificate of {command} is signed with {found}")
+    return problems
+
+
+def jdk_problems():
+    version = subprocess.run(["java", "-version"], capture_output=True, text=True, check=True).stderr
+    jdk = int(re.search(r'version "(\d+)', version)[1])
+    for size, expected in OWN_CHOICE.get(jdk, {}).items():
+        found = signature_algorithm(f"keytool -genkeypair -keyalg RSA -keysize {size} -alias release "
+                                    "-keystore release.p12")
+        if found != expected:
+            yield f"JDK {jdk} signs the certificate of a key of {size} bits with {found}"
+
+
+if __name__ == "__main__":
+    sys.exit(report(page_problems() + list(jdk_problems())))

@@ -1,0 +1,125 @@
+#!/usr/bin/env python3
+"""Holds debian/changelog against CHANGES.md, and has scripts/release make releases of a repository with
+good and bad tags, in which stand-ins install nothing and build empty packages. With the version of the
+build as its argument.
+"""
+
+import os
+import pathlib
+import re
+import shutil
+import subprocess
+import sys
+import tarfile
+import tempfile
+
+from sources import ROOT, report
+
+RELEASED = "# Changes\n\n## 1.2.3, 4 May 2026\n\n- It works.\n\n## 1.2.2, 3 May 2026\n"
+BUILDER = 'mkdir -p build/package && git rev-parse HEAD >build/package/tool.deb'
+
+
+def version_problems(version):
+    newest = re.search(r"^## (\S+),", (ROOT / "CHANGES.md").read_text(), re.M)[1]
+    if newest != version:
+        yield f"CHANGES.md is of {newest}, and {version} is built"
+    wanted = subprocess.run([ROOT / "scripts/changelog"], capture_output=True, text=True, check=True)
+    if (ROOT / "debian/changelog").read_text() != wanted.stdout:
+        yield "debian/changelog is not what scripts/changelog prints"
+
+
+class Repository:
+    def __init__(self, folder):
+        self.folder = folder
+        self.environment = {**os.environ, "GNUPGHOME": str(folder / "gpg"), "HOME": str(folder),
+                            "GIT_AUTHOR_NAME": "A", "GIT_AUTHOR_EMAIL": "a@example.com",
+                            "GIT_COMMITTER_NAME": "A", "GIT_COMMITTER_EMAIL": "a@example.com"}
+        (folder / "gpg").mkdir(mode=0o700)
+        (folder / "scripts").mkdir()
+        shutil.copy(ROOT / "scripts/release", folder / "scripts")
+        for name, content in (("setup", "true"), ("reproducible", BUILDER)):
+            script = folder / "scripts" / name
+            script.write_text(f"#!/bin/bash\n{content}\n")
+            script.chmod(0o755)
+        (folder / ".gitignore").write_text("/build/\n/gpg/\n/.gitconfig\n")
+        (folder / ".gitconfig").write_text("[tar]\n\tumask = user\n")  # the user's own wish
+        self.run("gpg", "--batch", "--quiet", "--passphrase", "", "--quick-generate-key",
+                 "A <a@example.com>", "ed25519", "sign")
+        self.run("git", "init", "--quiet")
+
+    def run(self, *command):
+        return subprocess.run(command, cwd=self.folder, env=self.environment, text=True, check=True,
+                              stdout=subprocess.PIPE, stderr=subprocess.STDOUT).stdout
+
+    def commit(self, changes):
+        (self.folder / "CHANGES.md").write_text(changes)
+        self.run("git", "add", ".")
+        self.run("git", "commit", "--quiet", "--message", "x")
+
+    def tag(self, name, *options):
+        self.run("git", "tag", "--message", "x", *options, name)
+
+    def release(self, name):
+        run = subprocess.run(["scripts/release", name], cwd=self.folder, env=self.environment,
+                             text=True, capture_output=True, check=False)
+        return run.returncode, run.stdout + run.stderr
+
+
+def refusal_problems(repository):
+    repository.commit(RELEASED)
+    repository.tag("v1.2.3", "--no-sign")
+    repository.tag("v1.2.2", "--sign")
+    repository.commit(RELEASED.replace("4 May", "in preparation since 4 May").replace("3,", "4,", 1))
+    repository.tag("v1.2.4", "--sign")
+    for tag, reason in (("v1.2.3", "the tag v1.2.3 has no signature by a key that gpg knows"),
+                        ("v1.2.2", "the newest heading of CHANGES.md is '## 1.2.3, 4 May 2026', "
+                                   "not of 1.2.2"),
+                        ("v1.2.4", "CHANGES.md says that 1.2.4 is in preparation"),
+                        ("v9", "the tag v9 has no signature by a key that gpg knows"),
+                        ("1.2.3", "usage: scripts/release TAG, with a tag such as v1.2.3")):
+        status, printed = repository.release(tag)
+        if status != 1 or f"release: {reason}\n" not in printed:
+            yield f"scripts/release {tag} ends with {status}: {printed}"
+        if (repository.folder / "build/releases" / tag[1:] / "SHA256SUMS").exists():
+            yield f"scripts/release {tag} left files"
+
+
+def release_problems(repository):
+    repository.commit(RELEASED)
+    repository.tag("v1.2.3", "--sign", "--force")
+    (repository.folder / "CHANGES.md").write_text("not committed")
+    out = repository.folder / "build/releases/1.2.3"
+    sums = []
+    for umask in (0o022, 0o077):
+        old = os.umask(umask)
+        status, printed = repository.release("v1.2.3")
+        os.umask(old)
+        if status != 0:
+            return [f"a good tag is refused: {printed}"]
+        sums.append((out / "SHA256SUMS").read_text())
+    problems = [] if sums[0] == sums[1] else [f"two runs make different files: {sums}"]
+    found = sorted(path.name for path in out.iterdir())
+    if found != ["SHA256SUMS", "apktoolkit-1.2.3.tar.gz", "tool.deb"]:
+        problems.append(f"the release has {found}")
+    if (out / "apktoolkit-1.2.3.tar.gz").read_bytes()[3:8] != bytes(5):
+        problems.append("the head of gzip's file has a name or a time")
+    with tarfile.open(out / "apktoolkit-1.2.3.tar.gz") as tarball:
+        if tarball.extractfile("apktoolkit-1.2.3/CHANGES.md").read().decode() != RELEASED:
+            problems.append("the tarball does not have what the tag has")
+    if (out / "tool.deb").read_text() != repository.run("git", "rev-parse", "v1.2.3^{commit}"):
+        problems.append("the package is not of the tag")
+    return problems
+
+
+def main():
+    problems = list(version_problems(sys.argv[1]))
+    with tempfile.TemporaryDirectory() as name:
+        repository = Repository(pathlib.Path(name))
+        problems += refusal_problems(repository)
+        problems += release_problems(repository)
+        repository.run("gpgconf", "--kill", "all")
+    return report(problems)
+
+
+if __name__ == "__main__":
+    sys.exit(main())
