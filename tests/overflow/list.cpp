@@ -1,5 +1,5 @@
-// Lists a manifest whose sections are in no order, and finds one. With the argument "hash" it does what
-// has to be trapped: it hashes by the C++ library.
+// Lists a manifest whose sections are in no order, and finds one. With the argument "hash" it does
+// what has to be trapped: it hashes by the C++ library.
 #include <cstdio>
 #include <functional>
 #include <string>
