@@ -24,11 +24,9 @@ int main(int argc, char* argv[]) {
   // Deliberate: without waiting for a FIFO's writer. It is a file that is no archive.
   const int fd = OpenForReading(argv[1], 0);
   // Deliberate: descriptor 0 is refused like a failed open. A caller that closed standard input
-  // did not set this process up as the install path does.
-  if (fd < 1) return 0;
-  // Deliberate: nothing can be signed on a read-only file system, and that is no error. The
-  // descriptor is left to the process exit.
-  if (IsOnReadOnlyFileSystem(fd)) return 0;
+  // did not set this process up as the install path does. Nothing can be signed on a read-only file
+  // system, and that is no error. The descriptor is left to the process exit.
+  if (fd < 1 || IsOnReadOnlyFileSystem(fd)) return 0;
 
   ApkTools::Apk apk(fd);
   // Deliberate: the results are not looked at. Each step asks the package itself whether it may

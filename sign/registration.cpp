@@ -23,11 +23,7 @@ void ReportResult(int result);
 
 void ZuSign(ApkTools::Apk& apk, int zip_fd, int fd) {
   const bool is_plain_jar = !apk.IsApk() && apk.IsGoodZip();
-  if (is_plain_jar) {
-    RegisterJar(zip_fd, fd);
-  } else {
-    RegisterPackage(apk, fd);
-  }
+  is_plain_jar ? RegisterJar(zip_fd, fd) : RegisterPackage(apk, fd);
 }
 
 namespace {

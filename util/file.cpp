@@ -5,6 +5,7 @@
 #include <unistd.h>
 
 #include <cerrno>
+#include <cstring>
 
 #include "util/log.h"
 #include "util/memory.h"
@@ -12,7 +13,9 @@
 
 namespace {
 
-std::string DescriptorLink(int fd);
+// The link in /proc that leads to the file that `fd` is open on, whatever its path leads to now.
+std::string DescriptorLink(int fd) { return "/proc/self/fd/" + std::to_string(fd); }
+
 ssize_t FindSize(int fd, struct stat* state);
 void ReadBytes(int fd, std::vector<uint8_t>& out);
 
@@ -21,10 +24,8 @@ void ReadBytes(int fd, std::vector<uint8_t>& out);
 bool IsSameFile(const struct stat& before, const struct stat& after) {
   return S_ISREG(before.st_mode) && S_ISREG(after.st_mode) && before.st_dev == after.st_dev &&
          before.st_ino == after.st_ino && before.st_size == after.st_size &&
-         before.st_mtim.tv_sec == after.st_mtim.tv_sec &&
-         before.st_mtim.tv_nsec == after.st_mtim.tv_nsec &&
-         before.st_ctim.tv_sec == after.st_ctim.tv_sec &&
-         before.st_ctim.tv_nsec == after.st_ctim.tv_nsec;
+         memcmp(&before.st_mtim, &after.st_mtim, sizeof(after.st_mtim)) == 0 &&
+         memcmp(&before.st_ctim, &after.st_ctim, sizeof(after.st_ctim)) == 0;
 }
 
 int OpenForReading(const char* path, int flags) {
@@ -69,9 +70,6 @@ std::string GetFilenameByFd(int fd) {
 std::vector<uint8_t> StringToVector(const std::string& s) { return {s.begin(), s.end()}; }
 
 namespace {
-
-// The link in /proc that leads to the file that `fd` is open on, whatever its path leads to now.
-std::string DescriptorLink(int fd) { return "/proc/self/fd/" + std::to_string(fd); }
 
 // The size in bytes of the regular file `fd`, whose position is then its start again, and its state
 // before. -1 if there is no such size, or none that fits in memory.

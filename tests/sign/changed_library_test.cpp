@@ -86,6 +86,18 @@ class ChangedLibrary : public testing::Test {
     return state;
   }
 
+  // How many descriptors of this process are open on the library.
+  int DescriptorsOfLibrary() const {
+    const struct stat library = State();
+    int count = 0;
+    for (int fd = 0; fd < 100; ++fd) {
+      struct stat state;
+      count += fstat(fd, &state) == 0 && state.st_dev == library.st_dev &&
+               state.st_ino == library.st_ino;
+    }
+    return count;
+  }
+
   static void Make(const Change& change) {
     if (change) change();
   }
@@ -217,6 +229,24 @@ TEST_F(ChangedLibrary, ExchangedForAFifoIsRefusedAtOnce) {
 TEST_F(ChangedLibrary, ExchangedForADirectoryIsRefusedAtOnce) {
   before_second_open_ = [this] { Link("lib"); };
   ExpectRefused(1);
+}
+
+// A file system may give the inode number of a file that is gone to the next one. With the same
+// size and the times of one tick of its clock it would look like the file that was read.
+TEST_F(ChangedLibrary, IsKeptOpenUntilItIsOpenedAgainSoThatNoOtherFileGetsItsNumber) {
+  after_digest_[1] = [this] { EXPECT_EQ(DescriptorsOfLibrary(), 1); };
+  before_second_open_ = [this] { EXPECT_EQ(DescriptorsOfLibrary(), 1); };
+  after_second_open_ = [this] { EXPECT_EQ(DescriptorsOfLibrary(), 2); };
+  ExpectSigned(1);
+}
+
+TEST_F(ChangedLibrary, ThatAppearsWhenItsFirstOpeningHasFailedIsRefused) {
+  int asked = 0;
+  file_.phone.open_error = [&](const char* path, int) {
+    return path == target_ && ++asked == 1 ? ENOENT : 0;
+  };
+  ExpectRefused(1);
+  EXPECT_EQ(asked, 2);
 }
 
 // --- Written to in place, and the times tell.
