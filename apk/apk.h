@@ -18,6 +18,10 @@
 
 namespace ApkTools {
 
+// The name of the signature block that belongs to a signature file: with "RSA" for what follows the
+// name's last dot; the name itself if it has none.
+std::string SignatureBlockName(const std::string& signature_file_name);
+
 class Apk {
  public:
   // The name of the manifest's entry; read at each use.

@@ -15,7 +15,6 @@ namespace ApkTools {
 
 namespace {
 
-std::string SignatureBlockName(const std::string& signature_file_name);
 bool FitsInBlock(const std::vector<uint8_t>& block, const uint8_t* start, size_t length);
 int LoadKey(const std::vector<uint8_t>& block, const pkcs7& record, rsa_context& key);
 int VerifySignature(const rsa_context& key, const std::vector<uint8_t>& block,
@@ -54,6 +53,13 @@ bool Apk::ExtractSignatureFile(std::string& name, std::vector<uint8_t>& content)
   const int32_t found = Next(cookie, &entry, name);
   EndIteration(cookie);
   return found == 0 && ExtractZipEntry(zip_handle_, &entry, content) == 0;
+}
+
+// Deliberate: only RSA blocks are looked for; no key of another kind is supported.
+std::string SignatureBlockName(const std::string& signature_file_name) {
+  const size_t dot = signature_file_name.rfind('.');
+  if (dot == std::string::npos) return signature_file_name;
+  return signature_file_name.substr(0, dot + 1) + "RSA";
 }
 
 bool Apk::VerifyCertificate(std::vector<uint8_t>& block, std::vector<uint8_t>& sha1,
@@ -130,13 +136,6 @@ bool Apk::VerifyData(const std::string& digest_name, const std::vector<uint8_t>&
 
 namespace {
 
-// Deliberate: only RSA blocks are looked for; no key of another kind is supported.
-std::string SignatureBlockName(const std::string& signature_file_name) {
-  const size_t dot = signature_file_name.rfind('.');
-  if (dot == std::string::npos) return signature_file_name;
-  return signature_file_name.substr(0, dot + 1) + "RSA";
-}
-
 // `start` points into the block, or to its end.
 bool FitsInBlock(const std::vector<uint8_t>& block, const uint8_t* start, size_t length) {
   const auto offset = static_cast<size_t>(start - block.data());
@@ -151,11 +150,7 @@ int LoadKey(const std::vector<uint8_t>& block, const pkcs7& record, rsa_context&
   // That is right for the exponents that signing tools make, which have one byte or are 65537.
   uint32_t exponent;
   memcpy(&exponent, record.exponent, sizeof(exponent));
-  // Deliberate: of all exponents this one is judged, the sign being of no account (mpi_pow_mod). A
-  // number to the power of 1 is itself, so that everyone could write down signatures for any key
-  // (docs/decisions/exponent-of-one.md).
-  const bool is_one = exponent == 1 || exponent == UINT32_MAX;
-  if (is_one) return kRsaBadInput;
+  if (rsa_is_forgeable(exponent)) return kRsaBadInput;
   return rsa_set_key(&key, record.modulus, nullptr, exponent, record.modulus_length);
 }
 

@@ -8,10 +8,6 @@
 
 namespace {
 
-// The bounds of a modulus, in bytes.
-constexpr uint32_t kMinModulusSize = 16;
-constexpr uint32_t kMaxModulusSize = 512;
-
 constexpr size_t kMd5Size = 16;
 constexpr size_t kSha1Size = 20;
 constexpr size_t kSha256Size = 32;
@@ -58,8 +54,8 @@ int rsa_pkcs1_verify(const rsa_context* ctx, const uint8_t* sha1, const uint8_t*
                      const uint8_t* md5, const uint8_t* sig) {
   if (ctx == nullptr || sha1 == nullptr || sig == nullptr) return kRsaBadInput;
   const uint32_t len = static_cast<uint32_t>(ctx->len);
-  if (len < kMinModulusSize || len > kMaxModulusSize) return kRsaBadInput;
-  uint8_t em[kMaxModulusSize];
+  if (len < kRsaMinModulusSize || len > kRsaMaxModulusSize) return kRsaBadInput;
+  uint8_t em[kRsaMaxModulusSize];
   if (const int result = public_operation(ctx, sig, em)) return result;
 
   uint8_t* const info = skip_padding(em, len);

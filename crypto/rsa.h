@@ -23,6 +23,18 @@ inline void mpi_apply(void (*call)(mpi* X, ...), rsa_context* ctx) {
 // A context that is empty at first and released when its scope ends.
 using rsa_local = mpi_owner<rsa_context>;
 
+// The bounds of a modulus that verifies, in bytes.
+inline constexpr uint32_t kRsaMinModulusSize = 16;
+inline constexpr uint32_t kRsaMaxModulusSize = 512;
+
+// True if anyone can make the signatures of a key with this exponent. The caller refuses such a key.
+// Deliberate: of all exponents this one is judged, the sign being of no account (mpi_pow_mod). A
+// number to the power of 1 is itself, so that everyone could write down signatures for any key
+// (docs/decisions/exponent-of-one.md).
+constexpr bool rsa_is_forgeable(uint32_t exponent_value) {
+  return exponent_value == 1 || exponent_value == UINT32_MAX;
+}
+
 // Results; 0 is success. The last two are flags on top of a code of the integers.
 inline constexpr int kRsaBadInput = 5;
 inline constexpr int kRsaInvalidPadding = 7;

@@ -217,8 +217,29 @@ void MakeExplanations() {
   SeedExplanation("signing-block", 1, block);
   SeedExplanation("certificate", 2, certificate);
   SeedExplanation("signature-block", 3, SmallBlock().Build(signature_file));
-  SeedExplanation("signature-file", 4, signature_file);
-  SeedExplanation("compiled-manifest", 5, CompiledManifest("com.example.app", true));
+  SeedExplanation("compiled-manifest", 4, CompiledManifest("com.example.app", true));
+}
+
+// The first byte says what is read (fuzz/journal_fuzz.cpp).
+void MakeJournals() {
+  Seed("journal", "text", Concat({{0}, ToBytes("a\u00fc\u202e\xff\uf7ff\n")}));
+  Seed("journal", "line", Concat({{1}, ToBytes("VeltSignJni: File not verified: /a\n")}));
+  Seed("journal", "run", Concat({{2}, ToBytes(R"({"event":"start","file":"a","path":"/a"}
+{"event":"log","priority":4,"tag":"ApkToolkit","text":"VeltSignJni starts: 3.\n"}
+{"event":"log","priority":4,"tag":"ApkToolkit","text":"VeltSign starts: zip_fd = 3, fd = 3.\n"}
+{"event":"log","priority":4,"tag":"ApkToolkit","text":"VeltSignOat: Apk case.\n"}
+{"event":"integrity","pid":0,"text":"0"}
+{"event":"sign","path":"/a","payload":"0000","result":0,"errno":0}
+{"event":"exit","status":0}
+)")}));
+}
+
+// Numbers that choose what there is and what happens (fuzz/verdict_fuzz.cpp): a package of one key,
+// which is signed, and whose key is registered.
+void MakeVerdicts() {
+  const Bytes package = {0, 1, 0, 1, 1, 0, 1, 0, 1, 0, 0, 1, 0};
+  const Bytes run = {0, 0, 1, 1, 0, 1, 3, 1, 0, 1, 0, 0, 1, 2, 2, 0, 1};
+  Seed("verdict", "signed", Concat({package, run}));
 }
 
 }  // namespace
@@ -237,5 +258,7 @@ int main(int argc, char* argv[]) {
   MakeCompiledManifests();
   MakePackages();
   MakeExplanations();
+  MakeJournals();
+  MakeVerdicts();
   return 0;
 }

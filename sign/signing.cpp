@@ -113,8 +113,11 @@ std::vector<uint8_t> SignPayload(const std::vector<uint8_t>& data) {
 
 // Returns false if nobody vouches for the file. Every other failure is logged here.
 bool SignLibrary(ApkTools::Apk& apk, const std::string& entry_name, const std::string& target) {
-  // The digested file stays open, so that no other file can get its inode number meanwhile.
-  const ScopedFd digested(OpenForReading(target.c_str(), O_CLOEXEC));
+  // The digested file stays open, so that no other file can get its inode number meanwhile. Its
+  // descriptor is a high one: the file that is signed gets the lowest that is free.
+  constexpr int kFarDescriptor = 100;
+  const ScopedFd digested(fcntl(ScopedFd(OpenForReading(target.c_str(), O_CLOEXEC)).get(),
+                                F_DUPFD_CLOEXEC, kFarDescriptor));
   struct stat read = {};
   if (!apk.VerifyFileHash(entry_name, target, &read, digested.get())) return false;
   if (digested.get() < 0) return false;

@@ -2,6 +2,7 @@
 
 #include <CLI/CLI.hpp>
 #include <algorithm>
+#include <cmath>
 #include <cstring>
 #include <iostream>
 
@@ -34,9 +35,6 @@ constexpr struct {
              {"arm64", InstalledAbi::kArm64},
              {"arm", InstalledAbi::kArm}};
 
-constexpr char kThePhone[] = "The phone";
-constexpr char kTheRun[] = "The run";
-
 std::vector<std::string> WordsOf(int argc, char** argv);
 void AddPhone(CLI::App* app, Options* options);
 void AddKernelAnswer(CLI::App* app, const char* name, int* error, const char* description);
@@ -59,14 +57,15 @@ std::optional<int> ParseOptions(int argc, char** argv, Options* options) {
   app.add_option("FILE", options->files, "Packages, JARs or other files")
       ->type_name("")
       ->required();
+  app.option_defaults()->group("The phone");
   AddPhone(&app, options);
+  app.option_defaults()->group("The run");
   AddInstallation(&app, options);
   AddOutput(&app, options);
   AddRun(&app, options, &runner);
   AddVerify(&app, options);
-  app.set_help_flag("-h,--help", "Print this help")->group(kTheRun);
-  app.set_version_flag("--version", "apktoolkit-sim " APKTOOLKIT_VERSION, "Print the version")
-      ->group(kTheRun);
+  app.set_help_flag("-h,--help", "Print this help");
+  app.set_version_flag("--version", "apktoolkit-sim " APKTOOLKIT_VERSION, "Print the version");
   try {
     app.parse(WordsOf(argc, argv));
   } catch (const CLI::RequiredError& error) {
@@ -106,8 +105,7 @@ void AddPhone(CLI::App* app, Options* options) {
          "What the tool reads as its integrity value;\n"
          "the last repeats, \"missing\" is no file\n"
          "[default: 1f]")
-      ->type_name("TEXT[,TEXT]...")
-      ->group(kThePhone);
+      ->type_name("TEXT[,TEXT]...");
   AddKernelAnswer(app, "--sign-errno", &phone->sign_errno,
                   "The kernel answers every signing with this\n"
                   "error, such as EPERM [default: it signs]");
@@ -115,18 +113,15 @@ void AddPhone(CLI::App* app, Options* options) {
                   "The kernel's answer for a file that it does\n"
                   "not trust [default: ENOKEY]");
   app->add_option("--zu-result", phone->zu_result, "What libzu answers [default: 0]")
-      ->type_name("N")
-      ->group(kThePhone);
+      ->type_name("N");
   app->add_option("--trust", options->run.trust, "The kernel trusts this file; may be repeated")
       ->check(CLI::ExistingFile.description(""))
       ->type_name("FILE")
-      ->allow_extra_args(false)
-      ->group(kThePhone);
+      ->allow_extra_args(false);
   app->add_option("--state", options->run.state,
                   "Remember in DIR what was signed, and trust it\n"
                   "while its bytes stay the same")
-      ->type_name("DIR")
-      ->group(kThePhone);
+      ->type_name("DIR");
 }
 
 void AddKernelAnswer(CLI::App* app, const char* name, int* error, const char* description) {
@@ -134,10 +129,7 @@ void AddKernelAnswer(CLI::App* app, const char* name, int* error, const char* de
     return ErrorNumber(text) == 0 ? "no error has the name " + text : std::string();
   };
   const auto set = [error](const std::string& text) { *error = ErrorNumber(text); };
-  app->add_option_function<std::string>(name, set, description)
-      ->type_name("NAME")
-      ->check(check)
-      ->group(kThePhone);
+  app->add_option_function<std::string>(name, set, description)->type_name("NAME")->check(check);
 }
 
 void AddInstallation(CLI::App* app, Options* options) {
@@ -156,60 +148,56 @@ void AddInstallation(CLI::App* app, Options* options) {
                                         "does, in a folder of their own: for phone, all,\n"
                                         "arm64 or arm [default: phone]")
       ->type_name("[=ABI]")
-      ->check(check)
-      ->group(kTheRun);
+      ->check(check);
   app->add_flag("--strict", options->judge.is_strict,
                 "A library that does not lie beside its package\n"
-                "counts as refused")
-      ->group(kTheRun);
+                "counts as refused");
 }
 
 void AddOutput(CLI::App* app, Options* options) {
   const auto print = [app, options](const char* name, Detail detail, const char* description) {
     const auto set = [name, options, detail](int64_t) {
-      if (options->detail != Detail::kUsual) {
+      if (options->show.detail != Detail::kUsual) {
         throw CLI::ValidationError(name, "--quiet and --verbose exclude each other");
       }
-      options->detail = detail;
+      options->show.detail = detail;
     };
-    app->add_flag_function(name, set, description)->group(kTheRun);
+    app->add_flag_function(name, set, description);
   };
   print("--quiet", Detail::kVerdict, "Print the verdicts alone");
   print("--verbose", Detail::kAll,
         "Print also what the signature leaves out, every\n"
         "signer, and the chain from key to entries");
-  app->add_flag("--json", options->json, "Print the journal, one JSON object a line")
-      ->group(kTheRun);
-  app->add_option("--journal", options->journal, "Keep the journal in FILE")
-      ->type_name("FILE")
-      ->group(kTheRun);
-  app->add_option("--html", options->html, "Write all of it to FILE, a page for a browser")
-      ->type_name("FILE")
-      ->group(kTheRun);
+  app->add_flag("--json", options->show.json, "Print the journal, one JSON object a line");
+  app->add_option("--journal", options->show.journal, "Keep the journal in FILE")
+      ->type_name("FILE");
+  app->add_option("--html", options->show.html, "Write all of it to FILE, a page for a browser")
+      ->type_name("FILE");
 }
 
 void AddRun(CLI::App* app, Options* options, std::string* runner) {
+  // "nan" is in every range.
+  const auto is_number = [](const std::string& text) {
+    return std::isnan(strtod(text.c_str(), nullptr)) ? text + " is no number" : std::string();
+  };
   app->add_option("--jobs", options->run.jobs, "Look at so many files at a time [default: 1]")
       ->type_name("N")
-      ->check(CLI::Range(1, 1024).description(""))
-      ->group(kTheRun);
+      ->check(CLI::Range(1, 1024).description(""));
   app->add_option("--timeout", options->run.timeout,
                   "Give up a file that takes longer\n"
                   "[default: 30]")
       ->type_name("SECONDS")
       ->check(CLI::Range(0.001, 1e6).description(""))
-      ->group(kTheRun);
+      ->check(is_number);
   app->add_option("--tool", options->run.tool,
                   "The program to run [default: the apktoolkit\n"
                   "beside this program]")
-      ->type_name("PATH")
-      ->group(kTheRun);
+      ->type_name("PATH");
   app->add_option("--runner", *runner,
                   "Words to put before the tool: an emulator that\n"
                   "takes -E NAME=VALUE [default: none]")
       ->type_name("COMMAND")
-      ->take_last()
-      ->group(kTheRun);
+      ->take_last();
 }
 
 // Nothing is signed then, and so there is no verdict that could be told.
@@ -217,8 +205,7 @@ void AddVerify(CLI::App* app, Options* options) {
   CLI::Option* const verify = app->add_flag("--verify", options->verify,
                                             "Sign nothing: ask the kernel which FILEs it\n"
                                             "trusts, by the apktoolkit-verify beside this\n"
-                                            "program")
-                                  ->group(kTheRun);
+                                            "program");
   for (const char* name : {kInstall, "--strict", "--quiet", "--verbose", "--html"}) {
     verify->excludes(app->get_option(name));
   }

@@ -6,25 +6,15 @@
 #include <vector>
 
 #include "simulator/run/simulator.h"
-#include "simulator/show/report_text.h"
+#include "simulator/show/presenter.h"
 #include "simulator/verdict/make_report.h"
 
 namespace simulator {
 
-// The exit statuses, for scripts. Of several files, the highest counts.
-inline constexpr int kAllSigned = 0;
-inline constexpr int kRefused = 1;
-inline constexpr int kUsageError = 2;
-inline constexpr int kCannotSimulate = 3;
-inline constexpr int kNotLookedAt = 4;
-
 struct Options {
   RunOptions run;
   JudgeOptions judge;
-  Detail detail = Detail::kUsual;  // of the text
-  std::string journal;             // where the journal is kept; empty: it is not
-  std::string html;                // where the page is written; empty: it is not
-  bool json = false;               // the journal on standard output in place of the text
+  ShowOptions show;
   bool verify = false;             // ask the kernel which files it trusts, and nothing else
   std::vector<std::string> files;  // what the tool is run for; at least one
 };

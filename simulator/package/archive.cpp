@@ -2,17 +2,28 @@
 
 #include <android/log.h>
 
+#include <unordered_set>
+
+#include "apk/extraction.h"
+#include "apk/zip_library.h"
+
 namespace simulator {
 
 namespace {
 
-void SilenceTheLibrary() {
-  static const bool done = [] {
+constexpr int32_t kNoMoreEntries = -1;
+
+void SilenceTheLog() {
+  [[maybe_unused]] static const bool done = [] {
     // A logger's parameters are others in each generation of the log library.
     __android_log_set_logger([](auto...) {});
     return true;
   }();
-  static_cast<void>(done);
+}
+
+// A name that no archive can hold is not there either.
+bool IsMissing(int32_t result) {
+  return result == ApkTools::kZipEntryNotFound || result == ApkTools::kZipInvalidEntryName;
 }
 
 bool HandOver(const uint8_t* bytes, size_t size, void* take) {
@@ -22,46 +33,66 @@ bool HandOver(const uint8_t* bytes, size_t size, void* take) {
 
 }  // namespace
 
-Archive::Archive(int fd, int32_t* result) {
-  SilenceTheLibrary();
+Archive::Archive(int fd, int32_t* result) : fd_(fd) {
+  SilenceTheLog();
   *result = OpenArchiveFd(fd, "", &handle_, false);
 }
 
 Archive::~Archive() { CloseArchive(handle_); }
 
-std::vector<ArchiveEntry> Archive::Entries(std::string_view prefix, std::string_view suffix) const {
-  std::vector<ArchiveEntry> entries;
-  void* cookie = nullptr;
-  if (StartIteration(handle_, &cookie, prefix, suffix) != 0) return entries;
-  ZipEntry entry;
-  std::string name;
-  while (Next(cookie, &entry, &name) == 0) {
-    entries.push_back({name, entry.compressed_length, entry.uncompressed_length,
-                       entry.method == kCompressStored});
-  }
-  EndIteration(cookie);
+std::vector<ArchiveEntry> Archive::Entries() const {
+  const auto end = FindArchiveEnd(fd_);
+  if (!end) return {};
+  const std::vector<std::string> good = Walk(kAllNames).names;
+  const std::unordered_set<std::string> names(good.begin(), good.end());
+  std::vector<ArchiveEntry> entries = ReadDirectory(fd_, *end);
+  for (ArchiveEntry& entry : entries) entry.is_damaged = names.count(entry.name) == 0;
   return entries;
 }
 
-bool Archive::Has(const std::string& name) const {
-  constexpr int32_t kEntryNotFound = -7;  // which the library's header does not name
+ArchiveWalk Archive::Walk(const EntryNames& names) const {
+  ArchiveWalk walk;
+  void* cookie = nullptr;
+  if (ApkTools::StartZipIteration(handle_, &cookie, names.prefix, names.suffix) != 0) return walk;
+  bool has_ended = false;  // for the tool
   ZipEntry entry;
-  return name.size() <= UINT16_MAX && FindEntry(handle_, name, &entry) != kEntryNotFound;
+  std::string name;
+  int32_t result;
+  while ((result = ApkTools::NextZipEntry(cookie, &entry, name)) != kNoMoreEntries) {
+    has_ended = has_ended || result != 0;
+    if (result == 0) walk.names.push_back(name);
+    if (!has_ended) walk.met = walk.names.size();
+  }
+  EndIteration(cookie);
+  return walk;
 }
 
-std::optional<std::string> Archive::Read(const std::string& name, uint64_t most) const {
-  std::string content;
-  const bool is_whole = Stream(name, [&](std::string_view part) {
-    content += part;
-    return content.size() <= most;
-  });
-  return is_whole ? std::optional(std::move(content)) : std::nullopt;
+bool Archive::Has(const std::string& name) const {
+  ZipEntry entry;
+  return !IsMissing(ApkTools::FindZipEntry(handle_, name, &entry));
+}
+
+Archive::ReadResult Archive::Read(const std::string& name, std::vector<uint8_t>* content) {
+  ZipEntry entry;
+  const int32_t found = ApkTools::FindZipEntry(handle_, name, &entry);
+  if (IsMissing(found)) return ReadResult::kMissing;
+  if (found == 0 && entry.uncompressed_length > kLongestRead &&
+      ApkTools::IsPlausibleLength(entry)) {
+    too_long_.push_back(name);
+    return ReadResult::kTooLong;
+  }
+  std::vector<uint8_t> extracted;
+  if (found != 0 || ApkTools::ExtractZipEntry(handle_, &entry, extracted) != 0) {
+    return ReadResult::kDamaged;
+  }
+  *content = std::move(extracted);
+  return ReadResult::kRead;
 }
 
 bool Archive::Stream(const std::string& name,
                      const std::function<bool(std::string_view part)>& take) const {
   ZipEntry entry;
-  if (name.size() > UINT16_MAX || FindEntry(handle_, name, &entry) != 0) return false;
+  if (ApkTools::FindZipEntry(handle_, name, &entry) != 0) return false;
   auto* const context = const_cast<std::function<bool(std::string_view)>*>(&take);
   return ProcessZipEntryContents(handle_, &entry, HandOver, context) == 0;
 }

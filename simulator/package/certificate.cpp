@@ -1,57 +1,78 @@
 #include "simulator/package/certificate.h"
 
+#include <openssl/bio.h>
+#include <openssl/bn.h>
+#include <openssl/evp.h>
+#include <openssl/mem.h>
+#include <openssl/obj.h>
+#include <openssl/rsa.h>
 #include <openssl/sha.h>
+#include <openssl/x509v3.h>
 
-#include "simulator/package/der.h"
-#include "simulator/package/distinguished_name.h"
+#include <algorithm>
+#include <cctype>
+
+#include "simulator/phone/text.h"
 
 namespace simulator {
 
 namespace {
 
-PublicKey ReadKey(CBS info);
-void ReadRsaKey(CBS bits, PublicKey* key);
-int CurveBits(CBS parameters);
-int NumberBits(std::string_view contents);
-std::string_view WithoutLeadingZeros(std::string_view number);
+PublicKey ReadKey(X509* certificate);
+std::string IssuerAndSerial(const X509* certificate);
+std::string Text(const uint8_t* bytes, int size);
+std::string NameText(const X509_NAME* name);
+std::string AttributeText(const X509_NAME_ENTRY* attribute);
+std::string KeyName(const ASN1_OBJECT* algorithm);
+std::string SignatureName(const ASN1_OBJECT* algorithm);
 
 }  // namespace
 
-// Certificate, tbsCertificate and SubjectPublicKeyInfo are those of RFC 5280 §4.1.
 std::optional<CertificateFacts> ParseCertificate(std::string_view der) {
-  CBS input = ToCbs(der);
-  CBS certificate;
-  CBS tbs;
-  CBS algorithm;
-  if (!CBS_get_asn1(&input, &certificate, CBS_ASN1_SEQUENCE) ||
-      !CBS_get_asn1(&certificate, &tbs, CBS_ASN1_SEQUENCE) ||
-      !CBS_get_asn1(&certificate, &algorithm, CBS_ASN1_SEQUENCE)) {
-    return {};
-  }
-  constexpr unsigned kVersion = CBS_ASN1_CONSTRUCTED | CBS_ASN1_CONTEXT_SPECIFIC | 0;
-  CBS serial;
-  CBS same_algorithm;
-  CBS issuer;
-  CBS validity;
-  CBS subject;
-  CBS key;
-  if (!CBS_get_optional_asn1(&tbs, nullptr, nullptr, kVersion) ||
-      !CBS_get_asn1(&tbs, &serial, CBS_ASN1_INTEGER) ||
-      !CBS_get_asn1(&tbs, &same_algorithm, CBS_ASN1_SEQUENCE) ||
-      !CBS_get_asn1_element(&tbs, &issuer, CBS_ASN1_SEQUENCE) ||
-      !CBS_get_asn1(&tbs, &validity, CBS_ASN1_SEQUENCE) ||
-      !CBS_get_asn1_element(&tbs, &subject, CBS_ASN1_SEQUENCE) ||
-      !CBS_get_asn1_element(&tbs, &key, CBS_ASN1_SEQUENCE)) {
-    return {};
-  }
+  const auto* const start = reinterpret_cast<const uint8_t*>(der.data());
+  const uint8_t* end = start;
+  const bssl::UniquePtr<X509> certificate(d2i_X509(nullptr, &end, static_cast<long>(der.size())));
+  if (certificate == nullptr) return {};
+  const X509_NAME* const subject = X509_get_subject_name(certificate.get());
+  const X509_NAME* const issuer = X509_get_issuer_name(certificate.get());
+  const X509_ALGOR* signature = nullptr;
+  const ASN1_OBJECT* algorithm = nullptr;
+  X509_get0_signature(nullptr, &signature, certificate.get());
+  X509_ALGOR_get0(&algorithm, nullptr, nullptr, signature);
+
   CertificateFacts facts;
-  facts.subject = NameText(ToView(subject));
-  facts.issuer = NameText(ToView(issuer));
-  facts.is_self_issued = ToView(subject) == ToView(issuer);
-  facts.sha256 = Sha256Hex(der.substr(0, der.size() - CBS_len(&input)));
-  facts.signature_algorithm = SignatureAlgorithmName(algorithm);
-  facts.key = ReadKey(key);
+  facts.subject = NameText(subject);
+  facts.issuer = NameText(issuer);
+  facts.is_self_issued = X509_NAME_cmp(subject, issuer) == 0;
+  facts.sha256 = Sha256Hex(der.substr(0, static_cast<size_t>(end - start)));
+  facts.signature_algorithm = SignatureName(algorithm);
+  const int nid = OBJ_obj2nid(algorithm);
+  facts.has_known_digest = nid == NID_md5WithRSAEncryption || nid == NID_sha1WithRSAEncryption ||
+                           nid == NID_sha256WithRSAEncryption;
+  facts.key = ReadKey(certificate.get());
+  facts.issuer_and_serial = IssuerAndSerial(certificate.get());
+  if (const ASN1_OCTET_STRING* const id = X509_get0_subject_key_id(certificate.get())) {
+    facts.key_id = Text(ASN1_STRING_get0_data(id), ASN1_STRING_length(id));
+  }
   return facts;
+}
+
+AlgorithmFacts AlgorithmOf(const ASN1_OBJECT* algorithm) {
+  const int nid = OBJ_obj2nid(algorithm);
+  if (nid != NID_undef) return {nid, OBJ_nid2sn(nid)};
+  char text[80] = "";
+  OBJ_obj2txt(text, sizeof(text), algorithm, 1);
+  return {nid, text};
+}
+
+AlgorithmFacts ParseAlgorithm(std::string_view der) {
+  const auto* bytes = reinterpret_cast<const uint8_t*>(der.data());
+  const bssl::UniquePtr<X509_ALGOR> parsed(
+      d2i_X509_ALGOR(nullptr, &bytes, static_cast<long>(der.size())));
+  if (parsed == nullptr) return {};
+  const ASN1_OBJECT* algorithm = nullptr;
+  X509_ALGOR_get0(&algorithm, nullptr, nullptr, parsed.get());
+  return AlgorithmOf(algorithm);
 }
 
 std::string Sha256Hex(std::string_view bytes) {
@@ -60,93 +81,101 @@ std::string Sha256Hex(std::string_view bytes) {
   return HexText({reinterpret_cast<const char*>(digest), sizeof(digest)});
 }
 
-std::string HexText(std::string_view bytes) {
-  constexpr char kDigits[] = "0123456789abcdef";
-  std::string text;
-  for (const char byte : bytes) {
-    text += kDigits[static_cast<uint8_t>(byte) >> 4];
-    text += kDigits[static_cast<uint8_t>(byte) & 15];
-  }
-  return text;
-}
-
 namespace {
 
-// `info` is the whole SubjectPublicKeyInfo.
-PublicKey ReadKey(CBS info) {
+PublicKey ReadKey(X509* certificate) {
   PublicKey key;
-  key.sha256 = Sha256Hex(ToView(info));
-  CBS contents;
-  CBS algorithm;
-  CBS oid;
-  CBS bits;
-  uint8_t unused_bits = 0;
-  if (!CBS_get_asn1(&info, &contents, CBS_ASN1_SEQUENCE) ||
-      !CBS_get_asn1(&contents, &algorithm, CBS_ASN1_SEQUENCE) ||
-      !CBS_get_asn1(&algorithm, &oid, CBS_ASN1_OBJECT) ||
-      !CBS_get_asn1(&contents, &bits, CBS_ASN1_BITSTRING) || !CBS_get_u8(&bits, &unused_bits)) {
-    return key;
-  }
-  const std::string name = OidText(oid);
-  key.algorithm = name;
-  if (name == "1.2.840.113549.1.1.1") {
-    key.algorithm = "RSA";
-    ReadRsaKey(bits, &key);
-  } else if (name == "1.2.840.10045.2.1") {
-    key.algorithm = "EC";
-    key.bits = CurveBits(algorithm);
-  } else if (name == "1.2.840.10040.4.1") {
-    key.algorithm = "DSA";
-    CBS parameters;
-    CBS prime;
-    if (CBS_get_asn1(&algorithm, &parameters, CBS_ASN1_SEQUENCE) &&
-        CBS_get_asn1(&parameters, &prime, CBS_ASN1_INTEGER)) {
-      key.bits = NumberBits(ToView(prime));
-    }
+  X509_PUBKEY* const info = X509_get_X509_PUBKEY(certificate);
+  ASN1_OBJECT* algorithm = nullptr;
+  X509_PUBKEY_get0_param(&algorithm, nullptr, nullptr, nullptr, info);
+  key.algorithm = KeyName(algorithm);
+  uint8_t* der = nullptr;
+  const int size = i2d_X509_PUBKEY(info, &der);
+  const bssl::UniquePtr<uint8_t> owner(der);
+  key.sha256 = Sha256Hex(Text(der, size));
+  // None for a key that the library does not take, such as one on another curve.
+  const bssl::UniquePtr<EVP_PKEY> parsed(X509_get_pubkey(certificate));
+  if (parsed == nullptr) return key;
+  key.bits = EVP_PKEY_bits(parsed.get());
+  if (const RSA* const rsa = EVP_PKEY_get0_RSA(parsed.get())) {
+    std::string modulus(BN_num_bytes(RSA_get0_n(rsa)), '\0');
+    BN_bn2bin(RSA_get0_n(rsa), reinterpret_cast<uint8_t*>(modulus.data()));
+    key.modulus_sha256 = Sha256Hex(modulus);
   }
   return key;
 }
 
-// RSAPublicKey of RFC 8017 §A.1.1.
-void ReadRsaKey(CBS bits, PublicKey* key) {
-  CBS numbers;
-  CBS modulus;
-  CBS exponent;
-  if (!CBS_get_asn1(&bits, &numbers, CBS_ASN1_SEQUENCE) ||
-      !CBS_get_asn1(&numbers, &modulus, CBS_ASN1_INTEGER)) {
-    return;
+// The last first; of one RelativeDistinguishedName, which mostly is one attribute, in their order.
+// Names with more attributes are cut; real ones have ten at most.
+std::string NameText(const X509_NAME* name) {
+  constexpr int kMostAttributes = 256;
+  std::string text, part;
+  const int count = std::min(X509_NAME_entry_count(name), kMostAttributes);
+  for (int i = 0; i < count; ++i) {
+    const X509_NAME_ENTRY* const attribute = X509_NAME_get_entry(name, i);
+    part += (part.empty() ? "" : " + ") + AttributeText(attribute);
+    const bool goes_on = i + 1 < count && X509_NAME_ENTRY_set(X509_NAME_get_entry(name, i + 1)) ==
+                                              X509_NAME_ENTRY_set(attribute);
+    if (goes_on) continue;
+    text.insert(0, part + (text.empty() ? "" : ", "));
+    part.clear();
   }
-  key->bits = NumberBits(ToView(modulus));
-  key->modulus_sha256 = Sha256Hex(WithoutLeadingZeros(ToView(modulus)));
-  if (CBS_get_asn1(&numbers, &exponent, CBS_ASN1_INTEGER)) key->exponent = ToView(exponent);
+  return text;
 }
 
-int CurveBits(CBS parameters) {
-  constexpr struct {
-    const char* oid;
-    int bits;
-  } kCurves[] = {{"1.2.840.10045.3.1.1", 192}, {"1.3.132.0.33", 224}, {"1.2.840.10045.3.1.7", 256},
-                 {"1.3.132.0.10", 256},        {"1.3.132.0.34", 384}, {"1.3.132.0.35", 521}};
-  CBS oid;
-  if (!CBS_get_asn1(&parameters, &oid, CBS_ASN1_OBJECT)) return 0;
-  const std::string name = OidText(oid);
-  for (const auto& curve : kCurves) {
-    if (name == curve.oid) return curve.bits;
-  }
-  return 0;
+// The library would print the whole name as well, but with keywords of its own, and people look for
+// the JDK's. The value is the library's work: in quotation marks where special characters ask for
+// them, and as hexadecimal digits where it is no text.
+std::string AttributeText(const X509_NAME_ENTRY* attribute) {
+  constexpr unsigned long kFlags = ASN1_STRFLGS_ESC_2253 | ASN1_STRFLGS_ESC_QUOTE |
+                                   ASN1_STRFLGS_UTF8_CONVERT | ASN1_STRFLGS_DUMP_UNKNOWN |
+                                   ASN1_STRFLGS_DUMP_DER;
+  const AlgorithmFacts type = AlgorithmOf(X509_NAME_ENTRY_get_object(attribute));
+  std::string text = type.nid == NID_undef ? "OID." + type.name : type.name;
+  for (char& c : text) c = static_cast<char>(toupper(static_cast<unsigned char>(c)));
+  if (type.nid == NID_title) text = "T";
+  if (type.nid == NID_surname) text = "SURNAME";
+  if (type.nid == NID_givenName) text = "GIVENNAME";
+  const bssl::UniquePtr<BIO> out(BIO_new(BIO_s_mem()));
+  ASN1_STRING_print_ex(out.get(), X509_NAME_ENTRY_get_data(attribute), kFlags);
+  const uint8_t* value = nullptr;
+  size_t size = 0;
+  BIO_mem_contents(out.get(), &value, &size);
+  return text + "=" + Text(value, static_cast<int>(size));
 }
 
-int NumberBits(std::string_view contents) {
-  contents = WithoutLeadingZeros(contents);
-  if (contents.empty()) return 0;
-  int bits = static_cast<int>(contents.size() - 1) * 8;
-  for (unsigned first = static_cast<uint8_t>(contents[0]); first != 0; first >>= 1) ++bits;
-  return bits;
+// The JDK's names of the three kinds that sign packages.
+std::string KeyName(const ASN1_OBJECT* algorithm) {
+  const AlgorithmFacts facts = AlgorithmOf(algorithm);
+  if (facts.nid == NID_rsaEncryption) return "RSA";
+  if (facts.nid == NID_X9_62_id_ecPublicKey) return "EC";
+  return facts.nid == NID_dsa ? "DSA" : facts.name;
 }
 
-std::string_view WithoutLeadingZeros(std::string_view number) {
-  const size_t first = number.find_first_not_of('\0');
-  return first == std::string_view::npos ? std::string_view() : number.substr(first);
+// As keytool's -sigalg takes it: digest "with" key.
+std::string SignatureName(const ASN1_OBJECT* algorithm) {
+  int digest = NID_undef;
+  int key = NID_undef;
+  const bool is_known = OBJ_find_sigid_algs(OBJ_obj2nid(algorithm), &digest, &key) != 0;
+  if (!is_known || digest == NID_undef) return AlgorithmOf(algorithm).name;
+  const char* const kind = key == NID_rsaEncryption ? "RSA" : key == NID_dsa ? "DSA" : "ECDSA";
+  return std::string(OBJ_nid2sn(digest)) + "with" + kind;
+}
+
+std::string IssuerAndSerial(const X509* certificate) {
+  const uint8_t* issuer = nullptr;
+  size_t issuer_size = 0;
+  X509_NAME_get0_der(X509_get_issuer_name(certificate), &issuer, &issuer_size);
+  uint8_t* serial = nullptr;
+  const int serial_size = i2d_ASN1_INTEGER(X509_get0_serialNumber(certificate), &serial);
+  const bssl::UniquePtr<uint8_t> owner(serial);
+  return Text(issuer, static_cast<int>(issuer_size)) + Text(serial, serial_size);
+}
+
+// Nothing for a size below 0, which is how the library tells a failure.
+std::string Text(const uint8_t* bytes, int size) {
+  if (size <= 0) return {};
+  return {reinterpret_cast<const char*>(bytes), static_cast<size_t>(size)};
 }
 
 }  // namespace

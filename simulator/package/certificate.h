@@ -1,8 +1,9 @@
 // Certificates, in the forms in which people compare them: those that `apksigner verify
-// --print-certs` prints. Read with the platform's crypto library; nothing is verified.
+// --print-certs` prints. Read by the platform's crypto library; nothing is verified.
 #pragma once
 
-#include <cstdint>
+#include <openssl/x509.h>
+
 #include <optional>
 #include <string>
 #include <string_view>
@@ -10,32 +11,42 @@
 namespace simulator {
 
 struct PublicKey {
-  std::string algorithm;  // "RSA", "EC" or "DSA"; else the object identifier
+  std::string algorithm;  // "RSA", "EC" or "DSA"; else as the library names it
   int bits = 0;           // 0: not known
   std::string sha256;     // of the SubjectPublicKeyInfo, in lower-case hexadecimal, as all digests
-  // Of an RSA key alone: what the kernel gets, which is the digest of the modulus without leading
-  // zeros, and the public exponent's contents as they are encoded.
+  // Of the modulus without leading zeros; empty where the library reads no RSA key.
   std::string modulus_sha256;
-  std::string exponent;
 };
 
 struct CertificateFacts {
-  std::string subject;  // as the JDK writes names
+  // The last attribute first, as apksigner writes names: "CN=Vault, O=Example". UTF-8.
+  std::string subject;
   std::string issuer;
   bool is_self_issued = false;  // issuer and subject are the same name
   std::string sha256;           // of the whole certificate
-  // What it is signed with, such as "SHA384withRSA"; else the object identifier.
+  // What it is signed with, such as "SHA384withRSA".
   std::string signature_algorithm;
+  bool has_known_digest = false;  // it is signed with RSA PKCS#1 v1.5 over MD5, SHA-1 or SHA-256
   PublicKey key;
+  // The contents of the two SignerIdentifiers by which a signature can name the certificate: issuer
+  // and serial number, and the subject key identifier, which may be empty.
+  std::string issuer_and_serial;
+  std::string key_id;
 };
 
-// None when the bytes are no certificate.
+// The certificate at the start of the bytes; none when there is none.
 std::optional<CertificateFacts> ParseCertificate(std::string_view der);
+
+struct AlgorithmFacts {
+  int nid = 0;       // the library's number for it; 0: it knows none
+  std::string name;  // as the library has it, such as "SHA256"; else the object identifier
+};
+
+AlgorithmFacts AlgorithmOf(const ASN1_OBJECT* algorithm);
+// Of an AlgorithmIdentifier; nothing where it does not read.
+AlgorithmFacts ParseAlgorithm(std::string_view der);
 
 // The SHA-256 digest in lower-case hexadecimal.
 std::string Sha256Hex(std::string_view bytes);
-
-// The lower-case hexadecimal digits of the bytes.
-std::string HexText(std::string_view bytes);
 
 }  // namespace simulator

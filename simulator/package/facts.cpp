@@ -3,72 +3,56 @@
 #include <fcntl.h>
 #include <sys/stat.h>
 #include <sys/statvfs.h>
-#include <unistd.h>
 
 #include <algorithm>
 #include <cerrno>
-#include <set>
 
-#include "simulator/package/archive_end.h"
-#include "simulator/package/jar_manifest.h"
-#include "simulator/package/signature_block.h"
+#include "apk/apk.h"
+#include "apk/entry_digests.h"
+#include "apk/native_libraries.h"
 #include "simulator/package/signing_block.h"
+#include "util/file.h"
+#include "util/scoped_fd.h"
+#include "util/text.h"
 
 namespace simulator {
 
 namespace {
 
-constexpr char kManifestName[] = "META-INF/MANIFEST.MF";
-constexpr char kAndroidManifestName[] = "AndroidManifest.xml";
-
-// Longer entries are not read to explain anything.
-constexpr uint64_t kMostManifest = 32 << 20;
-constexpr uint64_t kMostAndroidManifest = 4 << 20;
-constexpr uint64_t kMostBlock = 4 << 20;
+// Nothing waits for a writer or for whoever holds a lease, and a terminal stays whose it was.
+constexpr int kOpenFlags = O_RDONLY | O_CLOEXEC | O_NONBLOCK | O_NOCTTY;
 
 FileKind KindOf(int fd, uint64_t size);
 bool IsText(const std::string& start);
 void ReadArchive(int fd, PackageFacts* facts);
-JarSignatureFacts ReadJarSignature(const Archive& archive);
-void ReadBlock(const std::string& block, JarSignatureFacts* jar);
+void ListEntries(Archive* archive, PackageFacts* facts);
 bool IsSignatureName(const std::string& name);
-std::vector<ListedEntry> ListEntries(const Archive& archive, const std::set<std::string>& listed);
+void FindLibraries(const Archive& archive, const std::string& path, PackageFacts* facts);
+LibraryFacts FindLibrary(const std::string& entry, const std::string& path);
 void ReadNewerSigners(int fd, PackageFacts* facts);
-bool EndsWith(const std::string& text, const std::string& end);
 
 }  // namespace
 
 PackageFacts LookAt(const std::string& path) {
   PackageFacts facts;
+  const ScopedFd file(open(path.c_str(), kOpenFlags));
   struct stat state = {};
-  if (stat(path.c_str(), &state) != 0) {
-    facts.error = errno;
-    return facts;
-  }
-  // As the tool does: nothing waits for a writer, and a socket cannot be opened.
-  const int fd = open(path.c_str(), O_RDONLY | O_CLOEXEC | O_NONBLOCK | O_NOCTTY);
-  if (fd < 0) {
+  if (file.get() < 0 || fstat(file.get(), &state) != 0) {
     facts.error = errno;
     return facts;
   }
   struct statvfs system = {};
-  facts.is_read_only = fstatvfs(fd, &system) == 0 && (system.f_flag & ST_RDONLY) != 0;
+  facts.is_read_only = fstatvfs(file.get(), &system) == 0 && (system.f_flag & ST_RDONLY) != 0;
   if (S_ISDIR(state.st_mode)) {
-    facts.kind = FileKind::kFolder;
+    facts.kind = FileKind::kDirectory;
   } else if (!S_ISREG(state.st_mode)) {
     facts.kind = FileKind::kSpecial;
   } else {
     facts.size = static_cast<uint64_t>(state.st_size);
-    facts.kind = KindOf(fd, facts.size);
-    if (facts.kind == FileKind::kArchive) ReadArchive(fd, &facts);
+    facts.kind = KindOf(file.get(), facts.size);
+    if (facts.kind == FileKind::kArchive) ReadArchive(file.get(), &facts);
   }
-  close(fd);
   return facts;
-}
-
-AndroidManifest ReadAndroidManifest(const Archive& archive) {
-  return ParseCompiledManifest(
-      archive.Read(kAndroidManifestName, kMostAndroidManifest).value_or(""));
 }
 
 std::vector<std::string> NewerSchemes(const PackageFacts& facts) {
@@ -101,71 +85,77 @@ bool IsText(const std::string& start) {
 }
 
 void ReadArchive(int fd, PackageFacts* facts) {
-  const Archive archive(fd, &facts->archive_result);
+  Archive archive(fd, &facts->archive_result);
   if (facts->archive_result != 0) return;
-  facts->is_package = archive.Has(kAndroidManifestName);
-  facts->manifest = ReadAndroidManifest(archive);
-  facts->jar = ReadJarSignature(archive);
-  facts->jar.has_manifest = archive.Has(kManifestName);
-  const auto listing = archive.Read(kManifestName, kMostManifest);
-  facts->jar.can_read_manifest = listing.has_value();
-  facts->entries = ListEntries(archive, ListedEntries(listing.value_or("")));
-  facts->libraries = archive.Entries("lib/", ".so");
+  std::vector<uint8_t> manifest;
+  archive.Read(kAndroidManifestName, &manifest);
+  facts->manifest = ParseAndroidManifest(manifest);
+  facts->jar = ReadJarSignature(&archive);
+  ListEntries(&archive, facts);
+  FindLibraries(archive, GetFilenameByFd(fd), facts);
+  facts->too_long = archive.too_long();
+  if (facts->manifest.has_overlaps) facts->too_long.push_back(kAndroidManifestName);
   ReadNewerSigners(fd, facts);
+  facts->was_changed = archive.HasShrunk();
 }
 
-JarSignatureFacts ReadJarSignature(const Archive& archive) {
-  JarSignatureFacts jar;
-  for (const ArchiveEntry& entry : archive.Entries("META-INF/", ".SF")) {
-    jar.signature_files.push_back(entry.name);
-  }
-  if (jar.signature_files.empty()) return jar;
-  const std::string& name = jar.signature_files[0];
-  const std::string text = archive.Read(name, kMostManifest).value_or("");
-  jar.claimed_schemes = ClaimedSchemes(text);
-  jar.has_manifest_digest = StatesManifestDigest(text);
-  const std::string base = name.substr(0, name.rfind('.') + 1);
-  for (const char* kind : {"RSA", "EC", "DSA"}) {
-    if (!archive.Has(base + kind)) continue;
-    jar.block_name = base + kind;
-    ReadBlock(archive.Read(jar.block_name, kMostBlock).value_or(""), &jar);
-    break;
-  }
-  return jar;
-}
-
-void ReadBlock(const std::string& block, JarSignatureFacts* jar) {
-  const SignatureBlockFacts facts = ParseSignatureBlock(block);
-  jar->block_is_whole = facts.is_whole;
-  jar->signer_count = facts.signer_count;
-  jar->has_signed_attributes = facts.has_signed_attributes;
-  jar->digest = facts.digest;
-  jar->signature_algorithm = facts.signature_algorithm;
-  jar->certificate = ParseCertificate(facts.certificate);
-}
-
-std::vector<ListedEntry> ListEntries(const Archive& archive, const std::set<std::string>& listed) {
-  std::vector<ListedEntry> entries;
-  for (ArchiveEntry& entry : archive.Entries()) {
-    const bool is_listed = listed.count(entry.name) > 0;
+void ListEntries(Archive* archive, PackageFacts* facts) {
+  std::vector<uint8_t> text;
+  facts->jar.manifest = archive->Read(ApkTools::Apk::kMANIFEST_MF, &text);
+  ApkTools::EntryDigests manifest;
+  manifest.Load(std::move(text));
+  manifest.List();
+  std::string digest_name, digest;
+  for (ArchiveEntry& entry : archive->Entries()) {
+    const bool is_listed = manifest.Find(entry.name, digest_name, digest);
     const bool is_signature = IsSignatureName(entry.name);
-    entries.push_back({std::move(entry), is_listed, is_signature});
+    facts->entries.push_back({std::move(entry), is_listed, is_signature});
   }
-  return entries;
 }
 
 // The manifest, signature files and their blocks, which no manifest lists.
 bool IsSignatureName(const std::string& name) {
-  const std::string folder = "META-INF/";
-  if (name == kManifestName) return true;
-  if (name.compare(0, folder.size(), folder) != 0) return false;
-  if (name.find('/', folder.size()) != std::string::npos) return false;
+  constexpr std::string_view kDirectory = "META-INF/";
+  if (name == ApkTools::Apk::kMANIFEST_MF) return true;
+  if (name.compare(0, kDirectory.size(), kDirectory) != 0) return false;
+  if (name.find('/', kDirectory.size()) != std::string::npos) return false;
   return EndsWith(name, ".SF") || EndsWith(name, ".RSA") || EndsWith(name, ".EC") ||
          EndsWith(name, ".DSA");
 }
 
+// The tool's walk names all but the damaged ones.
+void FindLibraries(const Archive& archive, const std::string& path, PackageFacts* facts) {
+  const ArchiveWalk walk = archive.Walk(kLibraryNames);
+  for (size_t i = 0; i < walk.names.size(); ++i) {
+    facts->libraries.push_back(FindLibrary(walk.names[i], path));
+    facts->libraries.back().is_met = i < walk.met;
+  }
+  for (const ListedEntry& each : facts->entries) {
+    if (!each.entry.is_damaged || !kLibraryNames.Has(each.entry.name)) continue;
+    facts->libraries.push_back(FindLibrary(each.entry.name, path));
+    facts->libraries.back().is_met = false;
+  }
+}
+
+// What lies at the place of the library, told by opening it as the tool does.
+LibraryFacts FindLibrary(const std::string& entry, const std::string& path) {
+  LibraryFacts library;
+  library.entry = entry;
+  library.place = ApkTools::InstalledLibraryPath("", entry);
+  if (library.place.empty()) return library;
+  const std::string place = ApkTools::InstalledLibraryPath(path, entry);
+  const ScopedFd file(open(place.c_str(), kOpenFlags));
+  if (file.get() < 0) library.error = errno;
+  struct stat state = {};
+  library.has_directory = stat(place.substr(0, place.rfind('/') + 1).c_str(), &state) == 0;
+  return library;
+}
+
 void ReadNewerSigners(int fd, PackageFacts* facts) {
-  const std::string bytes = ReadSigningBlock(fd);
+  const auto end = FindArchiveEnd(fd);
+  bool is_too_large = false;
+  const std::string bytes = end ? ReadSigningBlock(fd, *end, &is_too_large) : std::string();
+  if (is_too_large) facts->too_long.push_back("the block of the schemes after v1");
   const SigningBlock block = ParseSigningBlock(bytes);
   facts->has_damaged_signing_block = block.is_damaged;
   for (const NewerSigner& signer : block.signers) {
@@ -173,10 +163,6 @@ void ReadNewerSigners(int fd, PackageFacts* facts) {
     facts->has_damaged_signing_block = facts->has_damaged_signing_block || !certificate;
     if (certificate) facts->newer.push_back({signer.scheme, *certificate});
   }
-}
-
-bool EndsWith(const std::string& text, const std::string& end) {
-  return text.size() >= end.size() && text.compare(text.size() - end.size(), end.size(), end) == 0;
 }
 
 }  // namespace

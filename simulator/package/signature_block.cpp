@@ -1,6 +1,9 @@
 #include "simulator/package/signature_block.h"
 
-#include "simulator/package/der.h"
+#include <openssl/nid.h>
+
+#include "simulator/package/cbs.h"
+#include "simulator/package/certificate.h"
 
 namespace simulator {
 
@@ -10,7 +13,6 @@ constexpr unsigned kContext0 = CBS_ASN1_CONSTRUCTED | CBS_ASN1_CONTEXT_SPECIFIC 
 constexpr unsigned kContext1 = CBS_ASN1_CONSTRUCTED | CBS_ASN1_CONTEXT_SPECIFIC | 1;
 
 bool EnterSignedData(CBS block, CBS* signed_data);
-void ReadCertificates(CBS certificates, SignatureBlockFacts* facts);
 bool ReadSigners(CBS signers, SignatureBlockFacts* facts);
 bool ReadSigner(CBS signer, SignatureBlockFacts* facts);
 
@@ -18,14 +20,14 @@ bool ReadSigner(CBS signer, SignatureBlockFacts* facts);
 
 SignatureBlockFacts ParseSignatureBlock(std::string_view block) {
   SignatureBlockFacts facts;
-  CBS signed_data;
-  CBS certificates;
-  CBS signers;
+  CBS signed_data, certificates, certificate, signers;
   if (!EnterSignedData(ToCbs(block), &signed_data) ||
       !CBS_get_asn1(&signed_data, &certificates, kContext0)) {
     return facts;
   }
-  ReadCertificates(certificates, &facts);
+  if (CBS_get_asn1_element(&certificates, &certificate, CBS_ASN1_SEQUENCE)) {
+    facts.certificate = ToView(certificate);
+  }
   facts.is_whole = CBS_get_optional_asn1(&signed_data, nullptr, nullptr, kContext1) &&
                    CBS_get_asn1(&signed_data, &signers, CBS_ASN1_SET) &&
                    ReadSigners(signers, &facts);
@@ -36,9 +38,7 @@ namespace {
 
 // Up to where the certificates come.
 bool EnterSignedData(CBS block, CBS* signed_data) {
-  CBS content_info;
-  CBS content;
-  CBS skipped;
+  CBS content_info, content, skipped;
   return CBS_get_asn1(&block, &content_info, CBS_ASN1_SEQUENCE) &&
          CBS_get_asn1(&content_info, &skipped, CBS_ASN1_OBJECT) &&
          CBS_get_asn1(&content_info, &content, kContext0) &&
@@ -46,13 +46,6 @@ bool EnterSignedData(CBS block, CBS* signed_data) {
          CBS_get_asn1(signed_data, &skipped, CBS_ASN1_INTEGER) &&
          CBS_get_asn1(signed_data, &skipped, CBS_ASN1_SET) &&
          CBS_get_asn1(signed_data, &skipped, CBS_ASN1_SEQUENCE);
-}
-
-void ReadCertificates(CBS certificates, SignatureBlockFacts* facts) {
-  CBS certificate;
-  while (CBS_get_asn1_element(&certificates, &certificate, CBS_ASN1_SEQUENCE)) {
-    if (facts->certificate_count++ == 0) facts->certificate = ToView(certificate);
-  }
 }
 
 bool ReadSigners(CBS signers, SignatureBlockFacts* facts) {
@@ -66,22 +59,23 @@ bool ReadSigners(CBS signers, SignatureBlockFacts* facts) {
 
 // SignerInfo: version, whose certificate, digest, signed attributes or none, algorithm, signature.
 bool ReadSigner(CBS signer, SignatureBlockFacts* facts) {
-  CBS skipped;
-  CBS digest;
-  CBS algorithm;
+  CBS skipped, identifier, digest, algorithm;
   int has_attributes = 0;
   unsigned tag = 0;
   if (!CBS_get_asn1(&signer, &skipped, CBS_ASN1_INTEGER) ||
-      !CBS_get_any_asn1(&signer, &skipped, &tag) ||
-      !CBS_get_asn1(&signer, &digest, CBS_ASN1_SEQUENCE) ||
+      !CBS_get_any_asn1(&signer, &identifier, &tag) ||
+      !CBS_get_asn1_element(&signer, &digest, CBS_ASN1_SEQUENCE) ||
       !CBS_get_optional_asn1(&signer, &skipped, &has_attributes, kContext0) ||
-      !CBS_get_asn1(&signer, &algorithm, CBS_ASN1_SEQUENCE) ||
+      !CBS_get_asn1_element(&signer, &algorithm, CBS_ASN1_SEQUENCE) ||
       !CBS_get_asn1(&signer, &skipped, CBS_ASN1_OCTETSTRING)) {
     return false;
   }
+  facts->signer_id = ToView(identifier);
   facts->has_signed_attributes = has_attributes != 0;
-  facts->digest = DigestName(digest);
-  facts->signature_algorithm = SignatureAlgorithmName(algorithm);
+  const AlgorithmFacts over = ParseAlgorithm(ToView(digest));
+  facts->digest = over.name;
+  facts->has_known_digest = over.nid == NID_md5 || over.nid == NID_sha1 || over.nid == NID_sha256;
+  facts->has_pss = ParseAlgorithm(ToView(algorithm)).nid == NID_rsassaPss;
   return true;
 }
 

@@ -1,6 +1,6 @@
-// The signature block of a JAR: a PKCS#7 SignedData (RFC 2315 §9), as far as explaining a refusal
-// needs it. Read as strict DER; the tool reads its own way, and what it makes of a block stands in
-// its log. What is read points into the caller's bytes.
+// The signature block of a JAR, a PKCS#7 SignedData (RFC 2315 §9), as strict DER. The tool reads it
+// its own way; this reader of its own is there for two things that the tool does not tell: what is
+// in a block that it refused, and what a strict reader sees in one that it took.
 #pragma once
 
 #include <cstddef>
@@ -11,13 +11,14 @@ namespace simulator {
 
 struct SignatureBlockFacts {
   bool is_whole = false;         // the block read to its last signer
-  std::string_view certificate;  // the first one, which is the one that the tool takes; DER
-  size_t certificate_count = 0;
+  std::string_view certificate;  // the first one, in the caller's bytes; DER
   size_t signer_count = 0;
   // Of the first signer:
+  std::string signer_id;  // contents of its SignerIdentifier (RFC 5652 §5.3)
   bool has_signed_attributes = false;
-  std::string digest;               // such as "SHA-256"
-  std::string signature_algorithm;  // such as "SHA256withRSA", or the key's alone
+  std::string digest;             // such as "SHA256"
+  bool has_known_digest = false;  // MD5, SHA-1 or SHA-256
+  bool has_pss = false;           // signed with RSASSA-PSS
 };
 
 SignatureBlockFacts ParseSignatureBlock(std::string_view block);

@@ -1,16 +1,16 @@
 #include "simulator/package/signing_block.h"
 
-#include "simulator/package/archive_end.h"
-#include "simulator/package/byte_reader.h"
+#include <set>
+
+#include "simulator/package/cbs.h"
 
 namespace simulator {
 
 namespace {
 
-constexpr char kMagic[] = "APK Sig Block 42";
-constexpr size_t kMagicSize = sizeof(kMagic) - 1;
+constexpr std::string_view kMagic = "APK Sig Block 42";
 constexpr size_t kSizeField = 8;
-constexpr size_t kFooter = kSizeField + kMagicSize;
+constexpr size_t kFooter = kSizeField + kMagic.size();
 
 // More signers than this in one block are not looked at; phones take ten.
 constexpr size_t kMostSigners = 16;
@@ -22,24 +22,29 @@ constexpr struct {
 } kSchemes[] = {{0x7109871a, "v2"}, {0xf05368c0, "v3"}, {0x1b93ad61, "v3.1"}};
 
 const char* SchemeOf(uint32_t id);
-bool ReadSigners(const char* scheme, std::string_view value, std::vector<NewerSigner>* signers);
-bool ReadCertificate(std::string_view signer, std::string_view* certificate);
+bool ReadSigners(const char* scheme, CBS value, std::vector<NewerSigner>* signers);
+bool ReadCertificate(CBS signer, CBS* certificate);
+bool TakePrefixed(CBS* bytes, CBS* part);
 
 }  // namespace
 
-// size, pairs, size again, magic; each size counts all but the first size field.
-std::string ReadSigningBlock(int fd) {
-  const auto end = FindArchiveEnd(fd);
-  if (!end || end->directory_offset < kSizeField + kFooter) return {};
-  const std::string footer = ReadAt(fd, end->directory_offset - kFooter, kFooter);
-  ByteReader reader(footer);
-  uint64_t size = 0;
-  std::string_view magic;
-  if (!reader.U64(&size) || !reader.Bytes(kMagicSize, &magic) || magic != kMagic) return {};
-  if (size < kFooter || size > kMostBlockBytes) return {};
-  if (size > end->directory_offset - kSizeField) return {};
-  return ReadAt(fd, end->directory_offset - size - kSizeField,
-                static_cast<size_t>(size) + kSizeField);
+// size, pairs, size again, magic; each size counts all but the first size field. Where the two
+// sizes are not the same, there is no block to the platform.
+std::string ReadSigningBlock(int fd, const ArchiveEnd& end, bool* is_too_large) {
+  *is_too_large = false;
+  if (end.directory_offset < kSizeField + kFooter) return {};
+  const std::string footer = ReadAt(fd, end.directory_offset - kFooter, kFooter);
+  uint64_t size = 0, first_size = 0;
+  CBS fields = ToCbs(footer);
+  if (!CBS_get_u64le(&fields, &size) || ToView(fields) != kMagic) return {};
+  if (size < kFooter || size > end.directory_offset - kSizeField) return {};
+  const uint64_t start = end.directory_offset - size - kSizeField;
+  const std::string head = ReadAt(fd, start, kSizeField);
+  fields = ToCbs(head);
+  if (!CBS_get_u64le(&fields, &first_size) || first_size != size) return {};
+  *is_too_large = size > kMostBlockBytes;
+  if (*is_too_large) return {};
+  return ReadAt(fd, start, static_cast<size_t>(size) + kSizeField);
 }
 
 SigningBlock ParseSigningBlock(std::string_view block) {
@@ -47,17 +52,19 @@ SigningBlock ParseSigningBlock(std::string_view block) {
   if (block.empty()) return result;
   result.is_damaged = true;
   if (block.size() < kSizeField + kFooter) return result;
-  ByteReader pairs(block.substr(kSizeField, block.size() - kSizeField - kFooter));
-  while (!pairs.empty()) {
+  CBS pairs = ToCbs(block.substr(kSizeField, block.size() - kSizeField - kFooter));
+  std::set<std::string_view> schemes;
+  while (CBS_len(&pairs) > 0) {
     uint64_t size = 0;
     uint32_t id = 0;
-    std::string_view pair;
-    if (!pairs.U64(&size) || !pairs.Bytes(size, &pair)) return result;
-    ByteReader value(pair);
-    if (!value.U32(&id)) return result;
+    CBS value;
+    if (!CBS_get_u64le(&pairs, &size) || !CBS_get_bytes(&pairs, &value, size) ||
+        !CBS_get_u32le(&value, &id)) {
+      return result;
+    }
     const char* const scheme = SchemeOf(id);
-    if (scheme == nullptr) continue;
-    if (!ReadSigners(scheme, pair.substr(sizeof(id)), &result.signers)) return result;
+    if (scheme == nullptr || !schemes.insert(scheme).second) continue;
+    if (!ReadSigners(scheme, value, &result.signers)) return result;
   }
   result.is_damaged = false;
   return result;
@@ -72,30 +79,29 @@ const char* SchemeOf(uint32_t id) {
   return nullptr;
 }
 
-// The signers of one scheme: a length, then each with its own.
-bool ReadSigners(const char* scheme, std::string_view value, std::vector<NewerSigner>* signers) {
-  std::string_view sequence;
-  if (!ByteReader(value).Prefixed(&sequence)) return false;
-  ByteReader reader(sequence);
-  while (!reader.empty()) {
-    std::string_view signer;
-    std::string_view certificate;
-    if (signers->size() == kMostSigners || !reader.Prefixed(&signer)) return false;
+// The signers of one scheme. The platform wants one at least.
+bool ReadSigners(const char* scheme, CBS value, std::vector<NewerSigner>* signers) {
+  CBS sequence, signer, certificate;
+  if (!TakePrefixed(&value, &sequence) || CBS_len(&sequence) == 0) return false;
+  while (CBS_len(&sequence) > 0) {
+    if (signers->size() == kMostSigners || !TakePrefixed(&sequence, &signer)) return false;
     if (!ReadCertificate(signer, &certificate)) return false;
-    signers->push_back({scheme, certificate});
+    signers->push_back({scheme, ToView(certificate)});
   }
   return true;
 }
 
 // All schemes begin alike: the signed data, which begins with digests and certificates.
-bool ReadCertificate(std::string_view signer, std::string_view* certificate) {
-  std::string_view signed_data;
-  std::string_view digests;
-  std::string_view certificates;
-  if (!ByteReader(signer).Prefixed(&signed_data)) return false;
-  ByteReader reader(signed_data);
-  return reader.Prefixed(&digests) && reader.Prefixed(&certificates) &&
-         ByteReader(certificates).Prefixed(certificate);
+bool ReadCertificate(CBS signer, CBS* certificate) {
+  CBS signed_data, digests, certificates;
+  return TakePrefixed(&signer, &signed_data) && TakePrefixed(&signed_data, &digests) &&
+         TakePrefixed(&signed_data, &certificates) && TakePrefixed(&certificates, certificate);
+}
+
+// So many bytes as the number before them says.
+bool TakePrefixed(CBS* bytes, CBS* part) {
+  uint32_t size = 0;
+  return CBS_get_u32le(bytes, &size) && CBS_get_bytes(bytes, part, size);
 }
 
 }  // namespace

@@ -1,12 +1,15 @@
 // The signatures of the schemes after JAR signing (v2, v3, v3.1), as far as whose key made them:
-// the signing block, which lies between an archive's entries and its central directory. Digests and
-// signatures are not verified. What is read is bounded and points into the caller's bytes.
+// the signing block, which lies between an archive's entries and its central directory. Found as
+// the platform finds it. Digests and signatures are not verified. What is read is bounded and
+// points into the caller's bytes.
 #pragma once
 
 #include <cstdint>
 #include <string>
 #include <string_view>
 #include <vector>
+
+#include "simulator/package/archive_directory.h"
 
 namespace simulator {
 
@@ -17,17 +20,18 @@ struct NewerSigner {
 };
 
 struct SigningBlock {
-  std::vector<NewerSigner> signers;  // in the order of the block
+  // In the order of the block; of several values for one scheme the first counts.
+  std::vector<NewerSigner> signers;
   // Something in the block did not read; the signers are those before it.
   bool is_damaged = false;
 };
 
-// A larger block than this counts as none; those of real packages have some kilobytes.
+// A larger block than this is not read; those of real packages have some kilobytes.
 inline constexpr uint64_t kMostBlockBytes = 16 << 20;
 
 // The signing block of the archive that is open as `fd`, from its first size field to its magic.
-// Empty when there is none, which needs an end of the central directory where it should be.
-std::string ReadSigningBlock(int fd);
+// Empty when there is none, or when it is larger than kMostBlockBytes, which `is_too_large` tells.
+std::string ReadSigningBlock(int fd, const ArchiveEnd& end, bool* is_too_large);
 
 SigningBlock ParseSigningBlock(std::string_view block);
 

@@ -25,7 +25,6 @@ namespace {
 
 using FopenFunction = FILE*(const char*, const char*);
 
-FILE* Fopen(FopenFunction* next, const char* path, const char* mode);
 std::optional<int> TaskOf(const char* path);
 FILE* OpenIntegrity(int pid, const char* mode);
 bool TaskExists(int pid);
@@ -35,21 +34,14 @@ int FileHolding(const std::string& text, bool closes_on_exec);
 
 STAND_IN FILE* fopen(const char* path, const char* mode) {
   static auto* const next = NextFunction<FopenFunction>("fopen");
-  return Fopen(next, path, mode);
-}
-
-// What fopen is in programs that are built for large files.
-STAND_IN FILE* fopen64(const char* path, const char* mode) {
-  static auto* const next = NextFunction<FopenFunction>("fopen64");
-  return Fopen(next, path, mode);
-}
-
-namespace {
-
-FILE* Fopen(FopenFunction* next, const char* path, const char* mode) {
   const auto pid = TaskOf(path);
   return pid ? OpenIntegrity(*pid, mode) : next(path, mode);
 }
+
+// What fopen is in programs that are built for large files: one function on a 64-bit system.
+STAND_IN FILE* fopen64(const char* path, const char* mode) __attribute__((alias("fopen")));
+
+namespace {
 
 // The task whose integrity file `path` names, 0 for "self"; none when it names another file.
 std::optional<int> TaskOf(const char* path) {

@@ -8,6 +8,8 @@
 #include <string>
 #include <string_view>
 
+#include "simulator/phone/text.h"
+
 namespace simulator {
 
 // The version of the schema; the journal's first line carries it.
@@ -16,14 +18,16 @@ inline constexpr int kJournalVersion = 1;
 // One line under construction. Keys are plain ASCII names.
 class Event {
  public:
-  explicit Event(const char* name);
+  explicit Event(const char* name) : line_("{\"event\":" + EncodeText(name)) {}
 
-  Event& Number(const char* key, int64_t value);
+  Event& Number(const char* key, int64_t value) { return Json(key, std::to_string(value)); }
   // A text is any bytes (see EncodeText).
-  Event& Text(const char* key, std::string_view bytes);
+  Event& Text(const char* key, std::string_view bytes) { return Json(key, EncodeText(bytes)); }
   // As lower-case hexadecimal digits.
-  Event& Hex(const char* key, std::string_view bytes);
-  Event& Null(const char* key);
+  Event& Hex(const char* key, std::string_view bytes) {
+    return Json(key, '"' + HexText(bytes) + '"');
+  }
+  Event& Null(const char* key) { return Json(key, "null"); }
   // A value that is JSON already.
   Event& Json(const char* key, std::string_view value);
 
@@ -33,8 +37,6 @@ class Event {
   bool AppendTo(int journal) const;
 
  private:
-  Event& Key(const char* key);
-
   std::string line_;
 };
 

@@ -31,7 +31,6 @@ constexpr int kVerifyCommand = 1125;
 
 using FcntlFunction = int(int, int, ...);
 
-int Fcntl(FcntlFunction* next, int fd, int command, void* argument);
 int Sign(int fd, const void* argument);
 int Verify(int fd);
 int DescriptorError(int fd);
@@ -53,32 +52,22 @@ __attribute__((constructor)) void Attach() {
 
 }  // namespace
 
+// Every command takes at most one argument, of a pointer's size at most.
 STAND_IN int fcntl(int fd, int command, ...) {
   static FcntlFunction* const next = NextFunction<FcntlFunction>("fcntl");
   va_list arguments;
   va_start(arguments, command);
   void* const argument = va_arg(arguments, void*);
   va_end(arguments);
-  return Fcntl(next, fd, command, argument);
-}
-
-STAND_IN int fcntl64(int fd, int command, ...) {
-  static FcntlFunction* const next = NextFunction<FcntlFunction>("fcntl64");
-  va_list arguments;
-  va_start(arguments, command);
-  void* const argument = va_arg(arguments, void*);
-  va_end(arguments);
-  return Fcntl(next, fd, command, argument);
-}
-
-namespace {
-
-// Every command takes at most one argument, of a pointer's size at most.
-int Fcntl(FcntlFunction* next, int fd, int command, void* argument) {
   if (command == kSignCommand) return Sign(fd, argument);
   if (command == kVerifyCommand) return Verify(fd);
   return next(fd, command, argument);
 }
+
+// One function in the C library of a 64-bit system, too.
+STAND_IN int fcntl64(int fd, int command, ...) __attribute__((alias("fcntl")));
+
+namespace {
 
 int Sign(int fd, const void* argument) {
   const int errno_before = errno;

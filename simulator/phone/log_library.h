@@ -29,15 +29,3 @@ template <typename Message, typename Write>
 void ReadLogRecord(const Message* message, Write write) {
   if constexpr (kLogLibraryHas<Message>) write(message->priority, message->tag, message->message);
 }
-
-// Writes a record as the platform's C++ libraries do.
-template <typename Data = __android_logger_data, typename Message = __android_log_message>
-void WriteLogRecord(int priority, const char* tag, const char* text) {
-  if constexpr (kLogLibraryHas<Message>) {
-    Message message = {sizeof(message), LOG_ID_MAIN, priority, tag, nullptr, 0, text};
-    __android_log_write_log_message(&message);
-  } else {
-    Data data = {sizeof(data), LOG_ID_MAIN, priority, tag, nullptr, 0};
-    __android_log_write_logger_data(&data, text);
-  }
-}

@@ -9,7 +9,8 @@ namespace simulator {
 namespace {
 
 bool IsPrivateByte(std::string_view character);
-void AppendEscape(unsigned code, std::string* out);
+uint32_t CodeOf(std::string_view character);
+void AppendEscape(uint32_t code, std::string* out);
 
 }  // namespace
 
@@ -18,17 +19,14 @@ std::string EncodeText(std::string_view bytes) {
   while (!bytes.empty()) {
     const size_t length = Utf8Length(bytes);
     const std::string_view character = bytes.substr(0, std::max<size_t>(length, 1));
-    const uint8_t first = static_cast<uint8_t>(character[0]);
     if (length == 0 || IsPrivateByte(character)) {
       for (const char byte : character) AppendEscape(0xf700U | static_cast<uint8_t>(byte), &out);
-    } else if (first < 0x20 || first == 0x7f) {
-      if (first == '\n') {
-        out += "\\n";
-      } else {
-        AppendEscape(first, &out);
-      }
+    } else if (character == "\n") {
+      out += "\\n";
+    } else if (IsHidden(character)) {
+      AppendEscape(CodeOf(character), &out);
     } else {
-      if (first == '"' || first == '\\') out += '\\';
+      if (character == "\"" || character == "\\") out += '\\';
       out += character;
     }
     bytes.remove_prefix(character.size());
@@ -53,27 +51,42 @@ std::string DecodeText(std::string_view utf8) {
   return bytes;
 }
 
+std::string HexText(std::string_view bytes) {
+  constexpr char kDigits[] = "0123456789abcdef";
+  std::string text;
+  for (const char byte : bytes) {
+    text += kDigits[static_cast<uint8_t>(byte) >> 4];
+    text += kDigits[static_cast<uint8_t>(byte) & 15];
+  }
+  return text;
+}
+
 // Well-formed as RFC 3629 §4 has it: no overlong forms, no surrogates, nothing above U+10FFFF.
 size_t Utf8Length(std::string_view bytes) {
-  const auto byte = [&bytes](size_t i) {
-    return i < bytes.size() ? static_cast<uint8_t>(bytes[i]) : 0U;
-  };
-  const auto is_tail = [&byte](size_t i) { return (byte(i) & 0xc0U) == 0x80; };
-  const unsigned first = byte(0);
+  constexpr uint32_t kLeast[] = {0, 0, 0x80, 0x800, 0x10000};
   if (bytes.empty()) return 0;
+  const uint8_t first = static_cast<uint8_t>(bytes[0]);
   if (first < 0x80) return 1;
-  if (first >= 0xc2 && first <= 0xdf) return is_tail(1) ? 2 : 0;
-  if (first >= 0xe0 && first <= 0xef) {
-    const bool overlong = first == 0xe0 && byte(1) < 0xa0;
-    const bool surrogate = first == 0xed && byte(1) > 0x9f;
-    return is_tail(1) && is_tail(2) && !overlong && !surrogate ? 3 : 0;
+  const size_t size = first < 0xc0 ? 0 : first < 0xe0 ? 2 : first < 0xf0 ? 3 : first < 0xf8 ? 4 : 0;
+  if (size == 0 || bytes.size() < size) return 0;
+  for (const char byte : bytes.substr(1, size - 1)) {
+    if ((static_cast<uint8_t>(byte) & 0xc0U) != 0x80) return 0;
   }
-  if (first >= 0xf0 && first <= 0xf4) {
-    const bool overlong = first == 0xf0 && byte(1) < 0x90;
-    const bool too_high = first == 0xf4 && byte(1) > 0x8f;
-    return is_tail(1) && is_tail(2) && is_tail(3) && !overlong && !too_high ? 4 : 0;
-  }
-  return 0;
+  const uint32_t code = CodeOf(bytes.substr(0, size));
+  const bool is_character = code >= kLeast[size] && code <= 0x10ffff && code >> 11 != 0x1b;
+  return is_character ? size : 0;
+}
+
+bool IsHidden(std::string_view character) {
+  constexpr struct {
+    uint32_t first, last;
+  } kHidden[] = {{0, 0x1f},        {0x7f, 0x9f},     {0xad, 0xad},      {0x61c, 0x61c},
+                 {0x180e, 0x180e}, {0x200b, 0x200f}, {0x2028, 0x202e},  {0x2060, 0x206f},
+                 {0xfeff, 0xfeff}, {0xfff9, 0xfffb}, {0xe0000, 0xe007f}};
+  const uint32_t code = CodeOf(character);
+  return std::any_of(std::begin(kHidden), std::end(kHidden), [code](const auto& range) {
+    return code >= range.first && code <= range.last;
+  });
 }
 
 std::vector<std::string> Split(const std::string& text, char separator) {
@@ -94,7 +107,21 @@ bool IsPrivateByte(std::string_view character) {
          (character[1] == '\x9e' || character[1] == '\x9f');
 }
 
-void AppendEscape(unsigned code, std::string* out) {
+uint32_t CodeOf(std::string_view character) {
+  const uint8_t first = static_cast<uint8_t>(character[0]);
+  const size_t size = character.size();
+  uint32_t code = size == 1 ? first : first & (0x7fU >> size);
+  for (const char byte : character.substr(1))
+    code = code << 6 | (static_cast<uint8_t>(byte) & 0x3fU);
+  return code;
+}
+
+// Beyond U+FFFF as two surrogates (RFC 8259 §7).
+void AppendEscape(uint32_t code, std::string* out) {
+  if (code > 0xffff) {
+    AppendEscape(0xd7c0U + (code >> 10), out);
+    code = 0xdc00U + (code & 0x3ffU);
+  }
   char escape[8];
   snprintf(escape, sizeof(escape), "\\u%04x", code);
   *out += escape;

@@ -25,6 +25,16 @@ int64_t NumberOf(const nlohmann::json& event, const char* key) {
   return value != event.end() && value->is_number_integer() ? value->get<int64_t>() : 0;
 }
 
+bool IsSuccess(const nlohmann::json& event) {
+  const auto result = event.find("result");
+  return result != event.end() && *result == 0;
+}
+
+bool IsOfTheRun(const nlohmann::json& event) {
+  const std::string kind = TextOf(event, "event");
+  return kind != "journal" && kind != "start" && kind != "attached" && kind != "verdict";
+}
+
 std::string DescribeErrno(int64_t error) {
   const char* const name = strerrorname_np(static_cast<int>(error));
   if (name == nullptr) return "error " + std::to_string(error);

@@ -18,6 +18,12 @@ Events ParseEvents(const std::string& journal);
 std::string TextOf(const nlohmann::json& event, const char* key);
 int64_t NumberOf(const nlohmann::json& event, const char* key);
 
+// Whether the answer in `event`, of the kernel or libzu, is 0.
+bool IsSuccess(const nlohmann::json& event);
+
+// Whether `event` tells of the run. The others are there for the journal's own sake.
+bool IsOfTheRun(const nlohmann::json& event);
+
 // Such as "ENOKEY: Required key not available".
 std::string DescribeErrno(int64_t error);
 

@@ -1,12 +1,12 @@
-// A package laid out as an installer does it: in a folder of its own, with its native libraries
-// beside it. The folder is gone with this object.
+// A package laid out as an installer does it: in a directory of its own, with its native libraries
+// beside it. The directory is gone with this object.
 #pragma once
 
 #include <optional>
 #include <string>
 #include <vector>
 
-#include "simulator/run/deadline.h"
+#include "simulator/run/process.h"
 
 namespace simulator {
 
@@ -32,13 +32,16 @@ class Installation {
 
   // Where the package lies now.
   const std::string& path() const { return path_; }
-  // The library entries that an installer would not take, or that cannot be extracted.
+  // The library entries whose names an installer does not take, and those that it would take and
+  // cannot extract.
   const std::vector<std::string>& left_out() const { return left_out_; }
+  const std::vector<std::string>& not_extracted() const { return not_extracted_; }
 
  private:
-  std::string folder_;
+  std::string directory_;
   std::string path_;
   std::vector<std::string> left_out_;
+  std::vector<std::string> not_extracted_;
 };
 
 }  // namespace simulator

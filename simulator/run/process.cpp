@@ -4,7 +4,9 @@
 #include <signal.h>
 #include <unistd.h>
 
+#include <cstdio>
 #include <initializer_list>
+#include <iostream>
 
 namespace simulator {
 
@@ -23,6 +25,9 @@ bool KeepStandardStreams() {
   for (const int stream : {STDIN_FILENO, STDOUT_FILENO, STDERR_FILENO}) {
     if (fcntl(stream, F_GETFD) < 0) open("/dev/null", O_RDONLY | O_CLOEXEC);
   }
+  // The stream that std::cout keeps is the one that there is now.
+  std::ios::sync_with_stdio(false);
+  if (FILE* const nowhere = fopen("/dev/null", "we")) stdout = nowhere;
   return has_input;
 }
 

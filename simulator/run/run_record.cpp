@@ -1,20 +1,16 @@
 #include "simulator/run/run_record.h"
 
-#include <cstdlib>
+#include <algorithm>
 #include <utility>
 
 #include "sign/libzu.h"
+#include "util/log.h"
 
 namespace simulator {
 
 namespace {
 
 using nlohmann::json;
-
-constexpr char kToolTag[] = "ApkToolkit";
-constexpr int kErrorPriority = 6;
-
-bool StartsWith(const std::string& text, const char* start) { return text.rfind(start, 0) == 0; }
 
 // Reads the events one after the other, and keeps in which step the tool is.
 class Reader {
@@ -26,21 +22,19 @@ class Reader {
   enum class Step { kOpening, kLibraries, kFile, kKey };
 
   void ReadLog(const json& event);
-  void ReadInformation(const std::string& text);
-  void ReadError(const std::string& text);
-  bool ReadLibraryError(const std::string& text);
-  bool ReadKeyError(const std::string& text);
+  void ReadInformation(const LogLine& line);
+  void ReadError(const LogLine& line);
   void ReadSign(const json& event);
   void ReadVerify(const json& event);
-  void ReadEnd(const json& event);
+  bool IsOwn(const std::string& path) const;
   void Begin();
+  void AddLibrary(const std::string& path, Attempt::Outcome outcome);
   void CloseAttempt();
 
   RunRecord record_;
   Step step_ = Step::kOpening;
-  std::optional<Attempt> attempt_;      // begun, and not yet closed
-  std::vector<std::string> pending_;    // errors that the next line tells the use of
-  std::optional<std::string> opening_;  // the library that could not be opened
+  std::optional<Attempt> attempt_;  // begun, and not yet closed
+  std::vector<LogLine> pending_;    // errors that the next line tells the use of
 };
 
 }  // namespace
@@ -53,14 +47,6 @@ RunRecord TakeApart(const Events& events) {
   return record;
 }
 
-std::optional<std::string> Between(const std::string& line, const std::string& before,
-                                   const std::string& after) {
-  if (line.rfind(before, 0) != 0) return {};
-  const size_t end = after.empty() ? line.size() : line.rfind(after);
-  if (end == std::string::npos || end < before.size()) return {};
-  return line.substr(before.size(), end - before.size());
-}
-
 namespace {
 
 void Reader::Read(const json& event) {
@@ -68,11 +54,12 @@ void Reader::Read(const json& event) {
   if (kind == "start") {
     record_.file = TextOf(event, "file");
     record_.path = TextOf(event, "path");
-    return;
+  } else if (kind == "exit") {
+    if (event.contains("signal")) record_.signal = NumberOf(event, "signal");
+    record_.status = NumberOf(event, "status");
   }
-  if (kind == "exit") return ReadEnd(event);
-  if (kind == "journal" || kind == "attached" || kind == "verdict") return;
-  record_.is_silent = false;
+  if (!IsOfTheRun(event)) return;
+  record_.is_silent = record_.is_silent && kind == "exit";
   if (kind == "log") ReadLog(event);
   if (kind == "sign") ReadSign(event);
   if (kind == "verify") ReadVerify(event);
@@ -87,127 +74,99 @@ void Reader::Read(const json& event) {
 
 RunRecord Reader::Finish() {
   CloseAttempt();
-  auto& others = record_.other_errors;
-  others.insert(others.end(), pending_.begin(), pending_.end());
+  for (const LogLine& line : pending_) record_.other_errors.push_back(line.whole);
   return std::move(record_);
 }
 
 void Reader::ReadLog(const json& event) {
-  if (TextOf(event, "tag") != kToolTag) return;
-  std::string text = TextOf(event, "text");
-  if (!text.empty() && text.back() == '\n') text.pop_back();
-  if (NumberOf(event, "priority") < kErrorPriority) {
-    ReadInformation(text);
-  } else {
-    ReadError(text);
-  }
-}
-
-void Reader::ReadInformation(const std::string& text) {
-  if (StartsWith(text, "VeltSignJni starts:")) step_ = Step::kLibraries;
-  if (StartsWith(text, "VeltSign starts:")) {
-    CloseAttempt();
-    step_ = Step::kFile;
-  }
-  if (StartsWith(text, "VeltSignOat: Apk case.")) Begin();
-  if (StartsWith(text, "VeltSignOat: non-Apk")) {
-    record_.is_jar = true;
-    Begin();
-  }
-  if (StartsWith(text, "VeltSign finished:")) {
-    CloseAttempt();
-    step_ = Step::kKey;
-  }
-}
-
-void Reader::ReadError(const std::string& text) {
-  const bool is_of_signing = StartsWith(text, "VELT can't sign a ");
-  if (is_of_signing && attempt_) {
-    if (attempt_->outcome == Attempt::Outcome::kBegun) {
-      attempt_->outcome = Attempt::Outcome::kNotAsked;
-    }
-    return CloseAttempt();
-  }
-  if (StartsWith(text, "Zip archive is not valid for fd=")) {
-    step_ = Step::kKey;
+  if (TextOf(event, "tag") != kLogTag) return;
+  const LogLine line = ReadLogLine(TextOf(event, "text"));
+  if (NumberOf(event, "priority") < ANDROID_LOG_ERROR) {
+    ReadInformation(line);
   } else if (step_ == Step::kOpening) {
-    record_.opening_errors.push_back(text);
-  } else if (!(step_ == Step::kLibraries ? ReadLibraryError(text) : ReadKeyError(text))) {
-    record_.other_errors.push_back(text);
+    record_.opening_errors.push_back(line);
+  } else {
+    ReadError(line);
   }
 }
 
-bool Reader::ReadLibraryError(const std::string& text) {
-  if (StartsWith(text, "Can't open file: ") || StartsWith(text, "Can't read file: ") ||
-      StartsWith(text, "Can't find file in ") || StartsWith(text, "verifyData: ")) {
-    pending_.push_back(text);
-    return true;
-  }
-  if (text == "Integrity not confirmed: classes.dex") {
-    record_.is_dex_refused = true;
-    record_.dex_errors = std::exchange(pending_, {});
-    return true;
-  }
-  if (StartsWith(text, "VeltSignJni: malformed apk: ")) return true;
-  if (const auto path = Between(text, "VeltSignJni: File not verified: ", "")) {
+void Reader::ReadInformation(const LogLine& line) {
+  const LogMeaning meaning = line.meaning;
+  if (meaning == LogMeaning::kLibrariesBegin) step_ = Step::kLibraries;
+  if (meaning == LogMeaning::kFileBegins || meaning == LogMeaning::kFileEnds) {
     CloseAttempt();
-    Attempt attempt;
-    attempt.path = *path;
-    attempt.outcome = Attempt::Outcome::kNotVerified;
-    attempt.errors = std::exchange(pending_, {});
-    record_.libraries.push_back(attempt);
-    return true;
+    step_ = meaning == LogMeaning::kFileBegins ? Step::kFile : Step::kKey;
   }
-  if (const auto path = Between(text, "File ", " is not opened")) {
-    CloseAttempt();
-    opening_ = *path;
-    return true;
-  }
-  if (const auto number = Between(text, "Error ", ""); number && opening_) {
-    Attempt attempt;
-    attempt.path = *std::exchange(opening_, std::nullopt);
-    attempt.outcome = Attempt::Outcome::kNotOpened;
-    attempt.error = strtol(number->c_str(), nullptr, 10);
-    record_.libraries.push_back(attempt);
-    return true;
-  }
-  return false;
+  if (meaning == LogMeaning::kJarTakenUp) record_.is_jar = true;
+  if (meaning == LogMeaning::kJarTakenUp || meaning == LogMeaning::kPackageTakenUp) Begin();
 }
 
-bool Reader::ReadKeyError(const std::string& text) {
-  if (StartsWith(text, "Apk archive is not valid for fd=")) {
-    return record_.is_key_refused_with_package = true;
+// Of an error behind the first step.
+void Reader::ReadError(const LogLine& line) {
+  switch (line.meaning) {
+    case LogMeaning::kNotSigned:
+      if (attempt_ && attempt_->outcome == Attempt::Outcome::kBegun) {
+        attempt_->outcome = Attempt::Outcome::kNotAsked;
+      }
+      return CloseAttempt();
+    case LogMeaning::kFileNotOpened:
+    case LogMeaning::kFileNotRead:
+    case LogMeaning::kNotListed:
+    case LogMeaning::kDigestUnknown:
+      return pending_.push_back(line);
+    case LogMeaning::kDexRefused:
+      record_.is_dex_refused = true;
+      if (!pending_.empty()) record_.dex_why = std::exchange(pending_, {})[0].meaning;
+      return;
+    case LogMeaning::kLibraryRefused:
+      return AddLibrary(line.text, Attempt::Outcome::kNotVerified);
+    case LogMeaning::kLibraryVanished:
+      return AddLibrary(line.text, Attempt::Outcome::kVanished);
+    case LogMeaning::kErrorNumber:
+      if (!record_.libraries.empty()) record_.libraries.back().error = line.number;
+      return;
+    case LogMeaning::kKeyOfRefusedPackage:
+      record_.is_key_refused_with_package = true;
+      return;
+    case LogMeaning::kNoPathOfJar:
+      record_.has_no_key_path = true;
+      return;
+    case LogMeaning::kRegistrationFailed:
+      // The answer itself is an event.
+      if (record_.registrations.empty() ||
+          IsZuSuccess(static_cast<int>(record_.registrations.back().result))) {
+        record_.other_errors.push_back(line.whole);
+      }
+      return;
+    case LogMeaning::kNoGoodPackage:
+    case LogMeaning::kNoArchiveToSign:
+      return;
+    default:
+      record_.other_errors.push_back(line.whole);
   }
-  if (StartsWith(text, "Can't get jar location from fd=")) return record_.has_no_key_path = true;
-  // The answer itself is an event.
-  return StartsWith(text, "ZuAddCertificate: ZuNewCertificate failed ") &&
-         !record_.registrations.empty() &&
-         !IsZuSuccess(static_cast<int>(record_.registrations.back().result));
 }
 
-// Whether it is the file itself that was signed, its path tells.
 void Reader::ReadSign(const json& event) {
-  if (!attempt_) Begin();
+  if (!attempt_ || attempt_->outcome != Attempt::Outcome::kBegun) Begin();
   attempt_->path = TextOf(event, "path");
   attempt_->payload = TextOf(event, "payload");
   attempt_->error = NumberOf(event, "errno");
-  const bool is_signed = NumberOf(event, "result") == 0;
+  const bool is_signed = IsSuccess(event);
   attempt_->outcome = is_signed ? Attempt::Outcome::kSigned : Attempt::Outcome::kKernelRefused;
   if (is_signed) CloseAttempt();
 }
 
 void Reader::ReadVerify(const json& event) {
-  if (TextOf(event, "path") != record_.path) return;
+  if (!IsOwn(TextOf(event, "path"))) return;
   record_.is_jar = true;
-  record_.verify_error = NumberOf(event, "result") == 0 ? 0 : NumberOf(event, "errno");
+  record_.verify_error = IsSuccess(event) ? 0 : std::max<int64_t>(NumberOf(event, "errno"), 1);
 }
 
-void Reader::ReadEnd(const json& event) {
-  if (event.contains("signal")) {
-    record_.signal = NumberOf(event, "signal");
-  } else {
-    record_.status = NumberOf(event, "status");
-  }
+// The step tells whether it is the file itself that the kernel is asked about; before and after the
+// steps, where the tool asks for nothing, its path.
+bool Reader::IsOwn(const std::string& path) const {
+  if (step_ == Step::kLibraries || step_ == Step::kFile) return step_ == Step::kFile;
+  return path.empty() || path == record_.path;
 }
 
 void Reader::Begin() {
@@ -215,18 +174,24 @@ void Reader::Begin() {
   attempt_ = Attempt();
 }
 
+void Reader::AddLibrary(const std::string& path, Attempt::Outcome outcome) {
+  CloseAttempt();
+  Attempt attempt;
+  attempt.path = path;
+  attempt.outcome = outcome;
+  if (!pending_.empty()) attempt.why = std::exchange(pending_, {})[0].meaning;
+  record_.libraries.push_back(attempt);
+}
+
 // A package that is not good, and a JAR that is not trusted, leave an attempt that came to nothing.
 void Reader::CloseAttempt() {
-  if (!attempt_) return;
-  if (attempt_->outcome == Attempt::Outcome::kBegun) return attempt_.reset();
-  const bool is_own =
-      attempt_->path.empty() ? step_ != Step::kLibraries : attempt_->path == record_.path;
-  if (is_own) {
-    record_.own = std::move(attempt_);
+  const std::optional<Attempt> attempt = std::exchange(attempt_, std::nullopt);
+  if (!attempt || attempt->outcome == Attempt::Outcome::kBegun) return;
+  if (IsOwn(attempt->path) && !record_.own) {
+    record_.own = attempt;
   } else {
-    record_.libraries.push_back(*std::move(attempt_));
+    record_.libraries.push_back(*attempt);
   }
-  attempt_.reset();
 }
 
 }  // namespace

@@ -1,6 +1,5 @@
 // A run of the tool, taken apart: which error belongs to which file. Made from the journal's events
-// and nothing else, but for what stands last in the record; texts of the tool's log are known here,
-// and only here.
+// and nothing else, but for what stands last in the record.
 #pragma once
 
 #include <cstdint>
@@ -9,6 +8,7 @@
 #include <vector>
 
 #include "simulator/run/events.h"
+#include "simulator/run/log_lines.h"
 
 namespace simulator {
 
@@ -19,16 +19,16 @@ struct Attempt {
     kSigned,
     kKernelRefused,
     kNotAsked,     // the tool may not sign: `integrity` tells
-    kNotVerified,  // a library: `errors` tell
-    kNotOpened,    // a library, after it was verified
+    kNotVerified,  // a library: `why` tells
+    kVanished,     // a library, after it was verified
   };
 
   std::string path;  // as log or kernel told; may be empty
   Outcome outcome = Outcome::kBegun;
-  int64_t error = 0;                     // the kernel's errno, or that of opening
-  std::string payload;                   // hexadecimal
-  std::optional<std::string> integrity;  // the tool's own value, as it was read last; none: no file
-  std::vector<std::string> errors;       // what was logged before, of this file
+  int64_t error = 0;                      // the kernel's errno, or that of opening
+  std::string payload;                    // that the kernel was handed, in hexadecimal
+  std::optional<std::string> integrity;   // the tool's own value, as read last; none: no file
+  LogMeaning why = LogMeaning::kUnknown;  // of the first error logged before, if any
 };
 
 // Why a run tells nothing of the file.
@@ -37,6 +37,7 @@ struct Failure {
     kNone,
     kNotStarted,
     kTimedOut,
+    kInterrupted,
     kStandInsMissing,
     kStateNotKept,
     kNotInstalled,
@@ -52,10 +53,10 @@ struct RunRecord {
   std::string path;
   bool is_silent = true;  // the tool neither said nor did anything
 
-  std::vector<std::string> opening_errors;  // before the first step
+  std::vector<LogLine> opening_errors;  // before the first step
   bool is_dex_refused = false;
-  std::vector<std::string> dex_errors;  // before it was
-  std::vector<Attempt> libraries;       // in order
+  LogMeaning dex_why = LogMeaning::kUnknown;  // of the first error logged before, if any
+  std::vector<Attempt> libraries;             // in order
   std::optional<Attempt> own;           // the file itself, where the kernel was or should be asked
   std::optional<int64_t> verify_error;  // a plain JAR: 0, or why the kernel does not trust it
   bool is_jar = false;
@@ -74,15 +75,13 @@ struct RunRecord {
 
   // What the simulator itself knows of the run.
   Failure failure;
-  bool has_standard_input = true;         // the tool was started with one
-  std::vector<std::string> not_laid_out;  // the files that --install left out
+  bool has_standard_input = true;  // the tool was started with one
+  // The library entries that --install does not take for their names, and those that it could not
+  // extract.
+  std::vector<std::string> not_laid_out;
+  std::vector<std::string> not_extracted;
 };
 
 RunRecord TakeApart(const Events& events);
-
-// What stands between the two texts in `line`; none when it is not of this form. An empty `after`
-// stands for all the rest.
-std::optional<std::string> Between(const std::string& line, const std::string& before,
-                                   const std::string& after);
 
 }  // namespace simulator

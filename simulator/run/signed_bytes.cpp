@@ -8,7 +8,9 @@
 #include <filesystem>
 #include <fstream>
 
-#include "simulator/package/certificate.h"
+#include "simulator/phone/text.h"
+#include "util/file.h"
+#include "util/scoped_fd.h"
 
 namespace simulator {
 
@@ -20,29 +22,19 @@ bool IsRegular(const std::string& path, struct stat* state) {
   return stat(path.c_str(), state) == 0 && S_ISREG(state->st_mode);
 }
 
-// The same file, and nothing has touched it.
-bool IsUntouched(const struct stat& a, const struct stat& b) {
-  const auto same_time = [](const timespec& x, const timespec& y) {
-    return x.tv_sec == y.tv_sec && x.tv_nsec == y.tv_nsec;
-  };
-  return a.st_dev == b.st_dev && a.st_ino == b.st_ino && a.st_size == b.st_size &&
-         same_time(a.st_mtim, b.st_mtim) && same_time(a.st_ctim, b.st_ctim);
-}
-
 // Empty when the file cannot be read in time.
 std::string DigestOf(const std::string& path, const Deadline& deadline) {
   struct stat state = {};
   if (!IsRegular(path, &state)) return {};
-  const int fd = open(path.c_str(), O_RDONLY | O_CLOEXEC | O_NONBLOCK);
-  if (fd < 0) return {};
+  const ScopedFd file(open(path.c_str(), O_RDONLY | O_CLOEXEC | O_NONBLOCK));
+  if (file.get() < 0) return {};
   SHA256_CTX context;
   SHA256_Init(&context);
   std::vector<char> buffer(1 << 18);
   ssize_t length = -1;
-  while (!deadline.HasPassed() && (length = read(fd, buffer.data(), buffer.size())) > 0) {
+  while (!deadline.HasPassed() && (length = read(file.get(), buffer.data(), buffer.size())) > 0) {
     SHA256_Update(&context, buffer.data(), static_cast<size_t>(length));
   }
-  close(fd);
   if (length != 0) return {};
   unsigned char digest[SHA256_DIGEST_LENGTH];
   SHA256_Final(digest, &context);
@@ -86,10 +78,10 @@ bool SignedBytes::Add(const std::string& path, const Deadline& deadline) {
 
 bool SignedBytes::IsSame(Seen* seen, const std::string& path, const struct stat& state,
                          const Deadline& deadline) {
-  if (IsUntouched(seen->state, state)) return true;
+  if (IsSameFile(seen->state, state)) return true;
   if (seen->state.st_size != state.st_size) return false;
   struct stat now = {};
-  const bool is_as_it_was = IsRegular(seen->path, &now) && IsUntouched(seen->state, now);
+  const bool is_as_it_was = IsRegular(seen->path, &now) && IsSameFile(seen->state, now);
   if (seen->digest.empty() && is_as_it_was) seen->digest = DigestOf(seen->path, deadline);
   return !seen->digest.empty() && seen->digest == DigestOf(path, deadline);
 }

@@ -13,7 +13,7 @@
 #include <string>
 #include <vector>
 
-#include "simulator/run/deadline.h"
+#include "simulator/run/process.h"
 
 namespace simulator {
 

@@ -15,17 +15,13 @@
 #include "simulator/phone/journal.h"
 #include "simulator/phone/text.h"
 #include "simulator/run/tool_process.h"
+#include "util/file.h"
 
 namespace simulator {
 
 namespace {
 
 namespace fs = std::filesystem;
-
-bool Fail(const std::string& message, std::string* error) {
-  *error = message;
-  return false;
-}
 
 // Why the last system call failed, as the end of a message.
 std::string ErrnoText() { return std::string(": ") + strerrordesc_np(errno); }
@@ -48,33 +44,17 @@ std::string OwnDescriptorPath(int fd) {
 }
 
 std::string ContentOf(int fd) {
-  std::string content;
-  char part[1 << 16];
-  ssize_t length;
-  while ((length = pread(fd, part, sizeof(part), static_cast<off_t>(content.size()))) > 0) {
-    content.append(part, static_cast<size_t>(length));
-  }
-  return content;
+  struct stat state = {};
+  fstat(fd, &state);
+  return ReadAt(fd, 0, static_cast<size_t>(state.st_size));
 }
 
 }  // namespace
 
 // Each run has a journal of its own, so that several may run at a time.
 struct Simulator::Task {
-  explicit Task(const Deadline& until)
-      : deadline(until), journal(memfd_create("journal", MFD_CLOEXEC)) {
-    if (journal >= 0) fcntl(journal, F_SETFL, O_APPEND);
-  }
-  ~Task() {
-    if (journal >= 0) close(journal);
-  }
-  Task(const Task&) = delete;
-  Task& operator=(const Task&) = delete;
-
-  void Fail(Failure::Kind kind, const std::string& detail) { failure = {kind, detail}; }
-
   const Deadline deadline;
-  const int journal;
+  const ScopedFd journal;
   std::string path;  // of the file that the tool is given, resolved
   Failure failure;
 };
@@ -85,77 +65,80 @@ Simulator::Simulator(const RunOptions& options, bool has_standard_input)
       kernel_(ProgramDirectory() + "/../lib/apktoolkit/libapktoolkit_kernel.so"),
       signed_(options.state, options.jobs == 1) {}
 
-Simulator::~Simulator() {
-  if (kernel_descriptor_ >= 0) close(kernel_descriptor_);
-}
-
-bool Simulator::Prepare(std::string* error) {
-  kernel_descriptor_ = open(kernel_.c_str(), O_RDONLY | O_CLOEXEC);
-  if (kernel_descriptor_ < 0) return Fail("there is no stand-in " + kernel_ + ErrnoText(), error);
-  if (access(options_.tool.c_str(), X_OK) != 0) {
-    return Fail("cannot run " + options_.tool + ErrnoText(), error);
-  }
-  return signed_.Load() || Fail("cannot use the directory " + options_.state, error);
+std::optional<std::string> Simulator::Prepare() {
+  kernel_descriptor_.emplace(open(kernel_.c_str(), O_RDONLY | O_CLOEXEC));
+  if (kernel_descriptor_->get() < 0) return "there is no stand-in " + kernel_ + ErrnoText();
+  if (access(options_.tool.c_str(), X_OK) != 0) return "cannot run " + options_.tool + ErrnoText();
+  if (!signed_.Load()) return "cannot use the directory " + options_.state;
+  return {};
 }
 
 FileRun Simulator::Run(const std::string& file) {
-  Task task((Deadline(options_.timeout)));
+  Task task = {Deadline(options_.timeout), ScopedFd(memfd_create("journal", MFD_CLOEXEC)), "", {}};
+  if (task.journal.get() >= 0) fcntl(task.journal.get(), F_SETFL, O_APPEND);
   Installation installation;
   std::string installed = file;
   if (options_.abi) {
     const auto problem = installation.LayOut(file, *options_.abi, task.deadline);
-    if (problem) task.Fail(Failure::Kind::kNotInstalled, *problem);
-    if (problem && task.deadline.HasPassed()) task.Fail(Failure::Kind::kTimedOut, SecondsText());
+    if (problem) Fail(Failure::Kind::kNotInstalled, *problem, &task);
     installed = installation.path();
   }
+  struct stat before = {};
+  const bool is_there = stat(installed.c_str(), &before) == 0 && S_ISREG(before.st_mode);
   task.path = Resolved(installed);
-  Event("start").Text("file", file).Text("path", task.path).AppendTo(task.journal);
+  Event("start").Text("file", file).Text("path", task.path).AppendTo(task.journal.get());
   if (task.failure.kind == Failure::Kind::kNone) RunToolFor(installed, &task);
 
   FileRun run;
-  run.journal = ContentOf(task.journal);
+  run.journal = ContentOf(task.journal.get());
   run.record = TakeApart(ParseEvents(run.journal));
   RememberSigned(run.record.events, &task);
   run.record.failure = task.failure;
   run.record.has_standard_input = has_standard_input_;
   run.record.not_laid_out = installation.left_out();
+  run.record.not_extracted = installation.not_extracted();
+  // What cannot be judged is not looked at.
+  if (task.failure.kind != Failure::Kind::kNone) return run;
   run.facts = LookAt(installed);
+  struct stat after = {};
+  const bool is_same = stat(installed.c_str(), &after) == 0 && IsSameFile(before, after);
+  run.facts.was_changed = run.facts.was_changed || (is_there && !is_same);
   return run;
 }
 
 // Runs the tool, and has the journal tell how it ended.
 void Simulator::RunToolFor(const std::string& file, Task* task) {
   const PhoneSettings phone = PhoneFor(*task);
-  if (task->deadline.HasPassed()) return task->Fail(Failure::Kind::kTimedOut, SecondsText());
+  if (task->deadline.HasPassed()) return Fail(Failure::Kind::kTimedOut, "", task);
   const ToolCommand command = {options_.runner, options_.tool, file, PreloadName(),
                                SettingsToEnvironment(phone)};
   const ToolEnd end = RunTool(command, task->deadline);
   switch (end.how) {
     case ToolEnd::How::kNotStarted:
       errno = end.value;
-      return task->Fail(Failure::Kind::kNotStarted,
-                        "cannot start " + ProgramOf(command) + ErrnoText());
-    case ToolEnd::How::kTimedOut:
-      Event("exit").Number("signal", SIGKILL).AppendTo(task->journal);
-      return task->Fail(Failure::Kind::kTimedOut, SecondsText());
+      return Fail(Failure::Kind::kNotStarted, "cannot start " + ProgramOf(command) + ErrnoText(),
+                  task);
+    case ToolEnd::How::kStopped:
+      Event("exit").Number("signal", SIGKILL).AppendTo(task->journal.get());
+      return Fail(Failure::Kind::kTimedOut, "", task);
     case ToolEnd::How::kKilled:
-      Event("exit").Number("signal", end.value).AppendTo(task->journal);
+      Event("exit").Number("signal", end.value).AppendTo(task->journal.get());
       break;
     case ToolEnd::How::kExited:
-      Event("exit").Number("status", end.value).AppendTo(task->journal);
+      Event("exit").Number("status", end.value).AppendTo(task->journal.get());
       break;
   }
-  const Events events = ParseEvents(ContentOf(task->journal));
+  const Events events = ParseEvents(ContentOf(task->journal.get()));
   const auto is_attached = [](const auto& event) { return TextOf(event, "event") == "attached"; };
   if (std::none_of(events.begin(), events.end(), is_attached)) {
-    task->Fail(Failure::Kind::kStandInsMissing, options_.tool);
+    Fail(Failure::Kind::kStandInsMissing, options_.tool, task);
   }
 }
 
 // The phone as the run finds it.
 PhoneSettings Simulator::PhoneFor(const Task& task) {
   PhoneSettings phone = options_.phone;
-  phone.journal = OwnDescriptorPath(task.journal);
+  phone.journal = OwnDescriptorPath(task.journal.get());
   for (const std::string& trusted : options_.trust) AddId(trusted, &phone.trusted);
   if (signed_.Holds(task.path, task.deadline)) AddId(task.path, &phone.trusted);
   return phone;
@@ -164,26 +147,26 @@ PhoneSettings Simulator::PhoneFor(const Task& task) {
 // The loader takes spaces and colons for separators; a descriptor's path has none.
 std::string Simulator::PreloadName() const {
   if (kernel_.find_first_of(" :") == std::string::npos) return kernel_;
-  return OwnDescriptorPath(kernel_descriptor_);
+  return OwnDescriptorPath(kernel_descriptor_->get());
 }
 
 void Simulator::RememberSigned(const Events& events, Task* task) {
   for (const auto& event : events) {
     const bool is_signed = TextOf(event, "event") == "sign" && NumberOf(event, "result") == 0;
     if (!is_signed || signed_.Add(TextOf(event, "path"), task->deadline)) continue;
-    if (task->deadline.HasPassed()) {
-      task->Fail(Failure::Kind::kTimedOut, SecondsText());
-    } else {
-      task->Fail(Failure::Kind::kStateNotKept, options_.state);
-    }
-    return;
+    return Fail(Failure::Kind::kStateNotKept, options_.state, task);
   }
 }
 
-std::string Simulator::SecondsText() const {
-  std::ostringstream text;
-  text << options_.timeout << (options_.timeout == 1 ? " second" : " seconds");
-  return text.str();
+// Once the deadline has passed, everything fails for that.
+void Simulator::Fail(Failure::Kind kind, const std::string& detail, Task* task) const {
+  task->failure = {kind, detail};
+  if (!task->deadline.HasPassed()) return;
+  std::ostringstream seconds;
+  seconds << options_.timeout << (options_.timeout == 1 ? " second" : " seconds");
+  const bool is_late = !IsInterrupted();
+  task->failure = {is_late ? Failure::Kind::kTimedOut : Failure::Kind::kInterrupted,
+                   is_late ? seconds.str() : ""};
 }
 
 }  // namespace simulator

@@ -11,6 +11,7 @@
 #include "simulator/run/installation.h"
 #include "simulator/run/run_record.h"
 #include "simulator/run/signed_bytes.h"
+#include "util/scoped_fd.h"
 
 namespace simulator {
 
@@ -36,13 +37,10 @@ struct FileRun {
 class Simulator {
  public:
   Simulator(const RunOptions& options, bool has_standard_input);
-  ~Simulator();
-  Simulator(const Simulator&) = delete;
-  Simulator& operator=(const Simulator&) = delete;
 
-  // Opens the state and looks for the stand-ins and the tool. False, with `error` set to what to
-  // tell the user, when the simulation cannot begin.
-  bool Prepare(std::string* error);
+  // Opens the state and looks for the stand-ins and the tool. None when the simulation can begin,
+  // else why it cannot.
+  std::optional<std::string> Prepare();
 
   // Runs the tool for `file`. May be called from several threads when the options have several
   // jobs.
@@ -56,13 +54,13 @@ class Simulator {
   PhoneSettings PhoneFor(const Task& task);
   std::string PreloadName() const;
   void RememberSigned(const Events& events, Task* task);
-  std::string SecondsText() const;
+  void Fail(Failure::Kind kind, const std::string& detail, Task* task) const;
 
   const RunOptions& options_;
   const bool has_standard_input_;
   const std::string kernel_;  // the path of the kernel stand-in
   SignedBytes signed_;
-  int kernel_descriptor_ = -1;
+  std::optional<ScopedFd> kernel_descriptor_;
 };
 
 }  // namespace simulator

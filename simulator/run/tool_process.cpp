@@ -11,8 +11,6 @@
 #include <map>
 #include <thread>
 
-#include "simulator/run/process.h"
-
 namespace simulator {
 
 namespace {
@@ -99,18 +97,18 @@ std::vector<char*> Pointers(Words* words) {
 
 ToolEnd Wait(pid_t child, const Deadline& deadline) {
   int status = 0;
-  bool timed_out = false;
+  bool is_stopped = false;
   while (waitpid(child, &status, WNOHANG) == 0) {
-    if (!deadline.HasPassed() && !IsInterrupted()) {
+    if (!deadline.HasPassed()) {
       std::this_thread::sleep_for(std::chrono::milliseconds(2));
     } else {
-      timed_out = true;
+      is_stopped = true;
       kill(child, SIGKILL);
       waitpid(child, &status, 0);
       break;
     }
   }
-  if (timed_out) return {ToolEnd::How::kTimedOut, 0};
+  if (is_stopped) return {ToolEnd::How::kStopped, 0};
   return WIFEXITED(status) ? ToolEnd{ToolEnd::How::kExited, WEXITSTATUS(status)}
                            : ToolEnd{ToolEnd::How::kKilled, WTERMSIG(status)};
 }

@@ -4,7 +4,7 @@
 #include <string>
 #include <vector>
 
-#include "simulator/run/deadline.h"
+#include "simulator/run/process.h"
 
 namespace simulator {
 
@@ -17,15 +17,15 @@ struct ToolCommand {
 };
 
 struct ToolEnd {
-  enum class How { kExited, kKilled, kTimedOut, kNotStarted };
+  enum class How { kExited, kKilled, kStopped, kNotStarted };
 
   How how;
   int value;  // kExited: the status. kKilled: the signal. kNotStarted: the errno. Otherwise 0.
 };
 
 // Runs the command to its end. Its standard output goes nowhere, since the journal has it; its
-// standard input and error are this process's. When the time is up, or this process is to end, the
-// tool is killed.
+// standard input and error are this process's. When the deadline passes, the tool is
+// killed.
 ToolEnd RunTool(const ToolCommand& command, const Deadline& deadline);
 
 // The program that is started: the runner, or else the tool.

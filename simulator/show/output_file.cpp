@@ -31,10 +31,6 @@ fs::path Resolved(const std::string& path) {
 
 }  // namespace
 
-OutputFile::~OutputFile() {
-  if (fd_ >= 0) close(fd_);
-}
-
 std::optional<std::string> OutputFile::Objection(const std::vector<std::string>& inputs) const {
   const std::string named = std::string(kind_.option) + " " + path_;
   struct stat state = {};
@@ -57,15 +53,23 @@ bool OutputFile::IsSameAs(const OutputFile& other) const {
   return Resolved(path_) == Resolved(other.path_) || fs::equivalent(path_, other.path_, error);
 }
 
+// A pipe is waited for, until somebody reads it, but not for long.
 bool OutputFile::Open() {
+  constexpr int kMostTries = 20;
+  constexpr useconds_t kPause = 100'000;
   if (!IsWanted()) return true;
-  fd_ = open(path_.c_str(), O_WRONLY | O_CREAT | O_TRUNC | O_CLOEXEC, 0666);
-  return fd_ >= 0;
+  const int flags = O_WRONLY | O_CREAT | O_TRUNC | O_CLOEXEC | O_NONBLOCK;
+  for (int i = 0; i < kMostTries; ++i) {
+    if (i > 0) usleep(kPause);
+    file_.emplace(open(path_.c_str(), flags, 0666));
+    if (file_->get() >= 0 || errno != ENXIO) break;
+  }
+  return file_->get() >= 0 && fcntl(file_->get(), F_SETFL, 0) == 0;
 }
 
 bool OutputFile::Append(std::string_view text) const {
   while (IsWanted() && !text.empty()) {
-    const ssize_t part = write(fd_, text.data(), text.size());
+    const ssize_t part = write(file_->get(), text.data(), text.size());
     if (part <= 0) return false;
     text.remove_prefix(static_cast<size_t>(part));
   }
@@ -74,7 +78,7 @@ bool OutputFile::Append(std::string_view text) const {
 
 std::string OutputFile::ErrorText() const {
   return std::string("cannot write the ") + kind_.name + " " + path_ + ": " +
-         strerrordesc_np(errno);
+         (errno == ENXIO ? "nobody reads it" : strerrordesc_np(errno));
 }
 
 }  // namespace simulator

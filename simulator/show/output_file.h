@@ -7,6 +7,8 @@
 #include <string_view>
 #include <vector>
 
+#include "util/scoped_fd.h"
+
 namespace simulator {
 
 struct OutputKind {
@@ -19,9 +21,6 @@ class OutputFile {
  public:
   // `path` may be empty: then nothing is wanted, and all that is below succeeds and does nothing.
   OutputFile(const OutputKind& kind, std::string path) : kind_(kind), path_(std::move(path)) {}
-  ~OutputFile();
-  OutputFile(const OutputFile&) = delete;
-  OutputFile& operator=(const OutputFile&) = delete;
 
   bool IsWanted() const { return !path_.empty(); }
 
@@ -41,7 +40,7 @@ class OutputFile {
  private:
   const OutputKind kind_;
   const std::string path_;
-  int fd_ = -1;
+  std::optional<ScopedFd> file_;
 };
 
 }  // namespace simulator

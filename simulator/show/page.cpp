@@ -4,11 +4,10 @@
 #include <cstdio>
 #include <utility>
 
-#include "simulator/show/page_template.h"
 #include "simulator/show/protection_bar.h"
-#include "simulator/show/report_words.h"
 #include "simulator/show/terminal.h"
 #include "simulator/show/timeline.h"
+#include "simulator/show/words.h"
 
 namespace simulator {
 
@@ -16,29 +15,30 @@ namespace {
 
 using kainjow::mustache::data;
 using kainjow::mustache::list;
+using kainjow::mustache::object;
 
 // The fields of the template's sections. Every text goes through Shown, and the template escapes
 // it.
 data FileFields(const Report& report, size_t number);
+list HeadLines(const Report& report);
 void AddItems(const Report& report, data* file);
-void AddWarnings(const std::vector<Reason>& warnings, data* file);
 void AddPicture(const Report& report, data* file);
-void AddChain(const std::vector<Link>& chain, data* file);
 void AddSigners(const Report& report, data* file);
-void AddTimeline(const Report& report, data* file);
+
+// Sets the section "NAME_shown" with the section `name` in it: what `make` makes of the first
+// lines, and how many there are beyond them.
+template <typename Lines, typename Make>
+void AddLines(const char* name, const Lines& lines, const std::string& remark, Make make,
+              data* file);
 
 data Shown(std::string_view bytes);
 std::string Short(std::string_view bytes);
 Reason Short(Reason reason);
 Item Short(Item item);
-CertificateFacts Short(CertificateFacts certificate);
 list OneIf(bool condition);
-void SetMark(Mark mark, data* line);
-void SetLines(const char* name, const list& lines, size_t count, const std::string& remark,
-              data* file);
+const char* StateOf(Mark mark);
 std::string Grouped(uint64_t number);
 std::string Decimal(double number);
-const char* CodeOf(Mood mood);
 
 }  // namespace
 
@@ -61,25 +61,54 @@ std::string Page::Html() const {
 namespace {
 
 data FileFields(const Report& report, size_t number) {
-  const VerdictWords words = WordsOf(report.verdict);
-  data file;
-  file.set("number", Shown(std::to_string(number)));
-  file.set("file", Shown(Short(report.file)));
-  file.set("verdict", Shown(words.word));
-  file.set("mood", Shown(CodeOf(words.mood)));
-  list about;
-  if (!report.package_name.empty()) about.push_back({"fact", Shown(Short(report.package_name))});
-  if (report.signer) {
-    about.push_back({"fact", Shown("signer " + SignerText(Short(*report.signer), "…"))});
-  }
-  file.set("about", about);
+  constexpr const char* kMoods[] = {"good", "mixed", "bad"};
+  const VerdictWords& words = WordsOf(report.verdict);
+  data file = object{{"number", Shown(std::to_string(number))},
+                     {"file", Shown(Short(report.file))},
+                     {"verdict", Shown(words.word)},
+                     {"mood", Shown(kMoods[static_cast<size_t>(words.mood)])},
+                     {"about", HeadLines(report)}};
   AddItems(report, &file);
-  AddWarnings(report.warnings, &file);
+  const auto warn = [](const Reason& warning) {
+    return object{{"warning", Shown(Short(warning).Text())},
+                  {"remedy", Shown(warning.cause->cure)}};
+  };
+  AddLines("warnings", report.warnings, "", warn, &file);
   AddPicture(report, &file);
-  AddChain(report.chain, &file);
+  const auto chain = [](const Link& link) {
+    const Mark mark = MarkOf(link.state);
+    return object{{"mark", Shown(SymbolOf(mark, true))},
+                  {"state", Shown(StateOf(mark))},
+                  {"link", Shown(link.name)},
+                  {"at", Shown(Short(TextOf(link)))},
+                  {"is_broken", data(link.state == LinkState::kBroken)}};
+  };
+  AddLines("chain", report.chain, "", chain, &file);
   AddSigners(report, &file);
-  AddTimeline(report, &file);
+  const auto tell = [](const TimelineLine& line) {
+    const bool has_detail = !line.detail.empty();
+    return object{{"what", Shown(line.what)},
+                  {"text", Shown(Short(line.text))},
+                  {"details", has_detail ? list{{"detail", Shown(Short(line.detail))}} : list()},
+                  {"is_failure", data(line.is_failure)}};
+  };
+  AddLines("events", MakeTimeline(report.events, report.path), "the journal has them all", tell,
+           &file);
   return file;
+}
+
+// What is long is cut before it is put together, so that the key stands behind a name of any
+// length.
+list HeadLines(const Report& report) {
+  Report head;
+  head.package_name = Short(report.package_name);
+  head.signer = report.signer;
+  if (head.signer) head.signer->subject = Short(head.signer->subject);
+  head.key = report.key;
+  for (const Reason& warning : report.warnings) head.warnings.push_back(Short(warning));
+  list lines;
+  for (const std::string& fact : HeadFacts(head, "…")) lines.push_back({"fact", Shown(fact)});
+  return lines;
 }
 
 void AddItems(const Report& report, data* file) {
@@ -88,118 +117,89 @@ void AddItems(const Report& report, data* file) {
   if (items.size() > kMostPageLines) {
     std::stable_partition(items.begin(), items.end(), is_refused);
   }
-  list lines;
-  for (size_t i = 0; i < std::min(items.size(), kMostPageLines); ++i) {
-    const Item item = Short(items[i]);
-    data line;
-    SetMark(MarkOf(item.state), &line);
-    line.set("name", Shown(NameOf(item)));
-    line.set("outcome", Shown(OutcomeOf(item, report.verdict)));
-    const bool is_last = i + 1 == std::min(items.size(), kMostPageLines);
-    const bool has_cure = HasCure(items[i], is_last ? nullptr : &items[i + 1]);
-    line.set("cures", has_cure ? list{{"cure", Shown(item.reason.cause->cure)}} : list());
-    lines.push_back(line);
-  }
+  const Item* const last = items.data() + std::min(items.size(), kMostPageLines) - 1;
+  const auto make = [&](const Item& item) {
+    const Mark mark = MarkOf(item.state);
+    const Item shown = Short(item);
+    const bool has_cure = HasCure(item, &item == last ? nullptr : &item + 1);
+    return object{{"mark", Shown(SymbolOf(mark, true))},
+                  {"state", Shown(StateOf(mark))},
+                  {"name", Shown(NameOf(shown))},
+                  {"outcome", Shown(OutcomeOf(shown, report.verdict))},
+                  {"cures", has_cure ? list{{"cure", Shown(item.reason.cause->cure)}} : list()}};
+  };
   const auto refused = static_cast<uint64_t>(std::count_if(items.begin(), items.end(), is_refused));
-  SetLines("items", lines, items.size(), Counted(refused, "is refused", "are refused") + " of all",
-           file);
-}
-
-void AddWarnings(const std::vector<Reason>& warnings, data* file) {
-  list lines;
-  for (size_t i = 0; i < std::min(warnings.size(), kMostPageLines); ++i) {
-    data line("warning", Shown(Short(warnings[i]).Text()));
-    line.set("remedy", Shown(warnings[i].cause->cure));
-    lines.push_back(line);
-  }
-  SetLines("warnings", lines, warnings.size(), "", file);
+  AddLines("items", items, Counted(refused, "is refused", "are refused") + " of all", make, file);
 }
 
 void AddPicture(const Report& report, data* file) {
-  const std::vector<BarPart> bar = MakeShareBar(report.protection, report.file_size);
+  const std::vector<DrawnPart> bar = DrawBar(report.protection, report.file_size);
   list parts;
   std::string description;
-  for (const BarPart& part : bar) {
-    data line;
-    line.set("part", Shown(part.code));
-    line.set("label", Shown(part.name));
-    line.set("meaning", Shown(part.meaning));
-    line.set("count", Shown(part.has_entries ? Grouped(part.share.entries) : "–"));
-    line.set("bytes", Shown(Grouped(part.share.bytes)));
-    line.set("percent", Shown(Decimal(part.percent)));
-    line.set("drawn", part.width > 0 ? list{{"width", Shown(Decimal(part.width))}} : list());
-    line.set("start", Shown(Decimal(part.start)));
-    parts.push_back(line);
+  for (const DrawnPart& part : bar) {
+    parts.push_back(
+        object{{"part", Shown(part.code)},
+               {"label", Shown(part.name)},
+               {"meaning", Shown(part.meaning)},
+               {"count", Shown(part.has_entries ? Grouped(part.share.entries) : "–")},
+               {"bytes", Shown(Grouped(part.share.bytes))},
+               {"percent", Shown(Decimal(part.percent))},
+               {"drawn", part.width > 0 ? list{{"width", Shown(Decimal(part.width))}} : list()},
+               {"start", Shown(Decimal(part.start))}});
     description += (description.empty() ? "" : ", ") + std::string(part.name) + " " +
                    Decimal(part.percent) + " %";
   }
   file->set("picture", OneIf(!bar.empty()));
   file->set("description", Shown(description));
   file->set("parts", parts);
-  const std::vector<std::string>& names = report.protection.unlisted_names;
-  list unlisted;
-  for (size_t i = 0; i < std::min(names.size(), kMostPageLines); ++i) {
-    unlisted.push_back({"entry", Shown(Short(names[i]))});
-  }
-  SetLines("unlisted", unlisted, names.size(), "", file);
-}
-
-void AddChain(const std::vector<Link>& chain, data* file) {
-  list links;
-  for (const Link& link : chain) {
-    data line;
-    SetMark(MarkOf(link.state), &line);
-    line.set("link", Shown(link.name));
-    line.set("at", Shown(Short(TextOf(link))));
-    line.set("is_broken", data(link.state == LinkState::kBroken));
-    links.push_back(line);
-  }
-  file->set("chained", OneIf(!links.empty()));
-  file->set("chain", links);
+  const auto name = [](const std::string& entry) { return object{{"entry", Shown(Short(entry))}}; };
+  AddLines("unlisted", report.protection.unlisted_names, "", name, file);
 }
 
 // Schemes of the same certificate are told together.
 void AddSigners(const Report& report, data* file) {
-  std::vector<std::pair<std::vector<std::string>, CertificateFacts>> signers;
-  const auto add = [&signers](const std::string& scheme, const CertificateFacts& certificate) {
-    const auto same = std::find_if(signers.begin(), signers.end(), [&](const auto& signer) {
-      return signer.second.sha256 == certificate.sha256;
-    });
-    if (same == signers.end()) return signers.push_back({{scheme}, certificate});
-    auto& schemes = same->first;
-    const bool is_known = std::find(schemes.begin(), schemes.end(), scheme) != schemes.end();
-    if (!is_known) schemes.push_back(scheme);
+  struct Signer {
+    std::vector<std::string> schemes;
+    std::string certificate;  // its digest
+    Rows rows;
   };
-  if (report.signer) add("v1", *report.signer);
-  for (const NewerSignerFacts& signer : report.newer) add(signer.scheme, signer.certificate);
-  list lines;
-  for (size_t i = 0; i < std::min(signers.size(), kMostPageLines); ++i) {
-    list rows;
-    const bool is_jar_signer = i == 0 && report.signer.has_value();
-    for (const auto& [label, value] : CertificateRows(Short(signers[i].second), is_jar_signer)) {
-      data row("term", Shown(label));
-      row.set("value", Shown(value));
-      rows.push_back(row);
-    }
-    data line("schemes", Shown(Joined(signers[i].first)));
-    line.set("rows", rows);
-    lines.push_back(line);
+  std::vector<Signer> signers;
+  if (report.signer || report.key) {
+    signers.push_back({{"v1"}, report.signer ? report.signer->sha256 : "", SignerRows(report)});
   }
-  SetLines("signers", lines, signers.size(), "", file);
+  for (const auto& [scheme, certificate] : report.newer) {
+    const auto same = std::find_if(
+        signers.begin(), signers.end(),
+        [&digest = certificate.sha256](const Signer& s) { return s.certificate == digest; });
+    if (same == signers.end()) {
+      signers.push_back({{scheme}, certificate.sha256, CertificateRows(certificate)});
+    } else if (same->schemes.back() != scheme) {
+      same->schemes.push_back(scheme);
+    }
+  }
+  const auto make = [](const Signer& signer) {
+    list rows;
+    for (const auto& [label, value] : signer.rows) {
+      rows.push_back(object{{"term", Shown(label)}, {"value", Shown(Short(value))}});
+    }
+    return object{{"schemes", Shown(Joined(signer.schemes))}, {"rows", rows}};
+  };
+  AddLines("signers", signers, "", make, file);
 }
 
-void AddTimeline(const Report& report, data* file) {
-  const std::vector<TimelineLine> events = MakeTimeline(report.events, report.path);
-  list lines;
-  for (size_t i = 0; i < std::min(events.size(), kMostPageLines); ++i) {
-    data line("what", Shown(events[i].what));
-    line.set("text", Shown(Short(events[i].text)));
-    const std::string& detail = events[i].detail;
-    line.set("details", detail.empty() ? list() : list{{"detail", Shown(Short(detail))}});
-    line.set("is_failure", data(events[i].is_failure));
-    lines.push_back(line);
+template <typename Lines, typename Make>
+void AddLines(const char* name, const Lines& lines, const std::string& remark, Make make,
+              data* file) {
+  list made;
+  while (made.size() < std::min(lines.size(), kMostPageLines)) {
+    made.push_back(data(make(lines[made.size()])));
   }
-  SetLines("events", lines, events.size(), "the journal has them all", file);
+  const size_t hidden = lines.size() - made.size();
+  const std::string text = Grouped(hidden) + " more" + (remark.empty() ? "" : "; " + remark);
+  file->set(std::string(name) + "_shown", OneIf(!made.empty()));
+  file->set(name, made);
+  file->set(std::string(name) + "_count", Shown(Grouped(lines.size())));
+  file->set(std::string(name) + "_more", hidden > 0 ? list{{"more", Shown(text)}} : list());
 }
 
 // Nothing is shown that would deceive the eye; characters that HTML gives a meaning are escaped
@@ -229,31 +229,12 @@ Item Short(Item item) {
   return item;
 }
 
-CertificateFacts Short(CertificateFacts certificate) {
-  certificate.subject = Short(certificate.subject);
-  certificate.key.algorithm = Short(certificate.key.algorithm);
-  return certificate;
-}
-
 // A section of the template that is shown or not, without fields of its own.
 list OneIf(bool condition) { return condition ? list{data()} : list(); }
 
-void SetMark(Mark mark, data* line) {
+const char* StateOf(Mark mark) {
   constexpr const char* kCodes[] = {"good", "bad", "neither"};
-  line->set("mark", Shown(SymbolOf(mark, true)));
-  line->set("state", Shown(kCodes[static_cast<size_t>(mark)]));
-}
-
-// Sets the section "NAME_shown" with the section `name` in it, of `count` lines those that are
-// shown, and how many are not.
-void SetLines(const char* name, const list& lines, size_t count, const std::string& remark,
-              data* file) {
-  const size_t hidden = count - lines.size();
-  const std::string text = Grouped(hidden) + " more" + (remark.empty() ? "" : "; " + remark);
-  file->set(std::string(name) + "_shown", OneIf(!lines.empty()));
-  file->set(name, lines);
-  file->set(std::string(name) + "_count", Shown(Grouped(count)));
-  file->set(std::string(name) + "_more", hidden > 0 ? list{{"more", Shown(text)}} : list());
+  return kCodes[static_cast<size_t>(mark)];
 }
 
 // Such as "1,234,567".
@@ -267,18 +248,6 @@ std::string Decimal(double number) {
   char text[32];
   snprintf(text, sizeof(text), "%.1f", number);
   return text;
-}
-
-const char* CodeOf(Mood mood) {
-  switch (mood) {
-    case Mood::kGood:
-      return "good";
-    case Mood::kMixed:
-      return "mixed";
-    case Mood::kBad:
-      return "bad";
-  }
-  return "";
 }
 
 }  // namespace

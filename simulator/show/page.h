@@ -17,10 +17,15 @@ namespace simulator {
 inline constexpr std::string_view kPageStart =
     "<!DOCTYPE html>\n<!-- A page of apktoolkit-sim -->\n";
 
-// Of each file no more than so many lines of a kind are shown, and no more than so many bytes of
-// any text that came from it. Lines that are left out are counted, and refusals go before the rest.
+// Of each file at most so many lines of a kind are shown. The rest are counted. If items are left
+// out, the refused ones go first.
 inline constexpr size_t kMostPageLines = 200;
+// Of a text that came from a file at most so many bytes are shown, with "…" for the rest, before
+// they are escaped.
 inline constexpr size_t kMostPageText = 400;
+
+// The page's template (page.mustache), which the build makes a part of the program.
+extern const char kPageTemplate[];
 
 class Page {
  public:

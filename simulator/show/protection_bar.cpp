@@ -2,7 +2,7 @@
 
 #include <algorithm>
 
-#include "simulator/show/report_words.h"
+#include "simulator/show/words.h"
 
 namespace simulator {
 
@@ -20,9 +20,9 @@ Share Between(const Protection& protection, uint64_t file_size) {
 
 }  // namespace
 
-std::vector<BarPart> MakeShareBar(const Protection& protection, uint64_t file_size) {
+std::vector<DrawnPart> DrawBar(const Protection& protection, uint64_t file_size) {
   constexpr double kLeast = 0.75;  // percent of the width, for whatever is there
-  std::vector<BarPart> parts = {
+  std::vector<DrawnPart> parts = {
       {"verified", kVerifiedWord, "dex and native libraries, compared with the manifest", true,
        protection.verified, 0, 0, 0},
       {"vouched", kVouchedWord, "the manifest has a digest, which nothing was found to match", true,
@@ -36,14 +36,14 @@ std::vector<BarPart> MakeShareBar(const Protection& protection, uint64_t file_si
   double all = 0;
   size_t entries = 0;
   double free_width = 100;
-  for (const BarPart& part : parts) {
+  for (const DrawnPart& part : parts) {
     all += static_cast<double>(part.share.bytes);
     entries += part.share.entries;
     if (part.share.bytes > 0) free_width -= kLeast;
   }
   if (entries == 0) return {};
   double start = 0;
-  for (BarPart& part : parts) {
+  for (DrawnPart& part : parts) {
     part.start = start;
     if (part.share.bytes == 0) continue;
     const double share = static_cast<double>(part.share.bytes) / all;

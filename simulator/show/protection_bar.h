@@ -1,4 +1,4 @@
-// The picture of a package by its bytes: one bar, and what its parts are.
+// How what the signature protects (Protection) is drawn: one bar, and what its parts are.
 #pragma once
 
 #include <cstdint>
@@ -8,7 +8,7 @@
 
 namespace simulator {
 
-struct BarPart {
+struct DrawnPart {
   const char* code;     // of its look
   const char* name;     // in the legend
   const char* meaning;  // what is to be known of it
@@ -21,6 +21,6 @@ struct BarPart {
 
 // From what the signature protects best to what lies between the entries. Empty when the file has
 // no entries.
-std::vector<BarPart> MakeShareBar(const Protection& protection, uint64_t file_size);
+std::vector<DrawnPart> DrawBar(const Protection& protection, uint64_t file_size);
 
 }  // namespace simulator

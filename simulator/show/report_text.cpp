@@ -2,8 +2,8 @@
 
 #include <algorithm>
 
-#include "simulator/show/report_words.h"
 #include "simulator/show/timeline.h"
+#include "simulator/show/words.h"
 
 namespace simulator {
 
@@ -11,6 +11,7 @@ namespace {
 
 constexpr size_t kWidth = 80;  // what to do is wrapped to it
 constexpr size_t kMostName = 40;
+constexpr Colour kMoodColours[] = {Colour::kGreen, Colour::kYellow, Colour::kRed};
 
 // Prints one report.
 class Printer {
@@ -21,25 +22,26 @@ class Printer {
   void PrintHead();
   void PrintItems();
   void PrintWarnings();
+  void PrintUnlisted();
   void PrintSigner();
   void PrintNewerSigners();
-  void PrintProtection();
-  void PrintUnlisted();
   void PrintChain();
 
  private:
-  void PrintItem(const Item& item, size_t width);
-  void PrintWrapped(const std::string& text, size_t indent);
-  void PrintCertificate(const CertificateFacts& certificate, bool is_jar_signer);
-  std::string Shown(std::string_view bytes) const { return Printable(bytes, look_); }
+  // A line with nothing in it that may not be shown.
+  void Print(const std::string& text, Colour colour = Colour::kPlain) {
+    out_ << Coloured(Printable(text, look_), colour, look_) << '\n';
+  }
+  std::string Symbol(Mark mark) const { return SymbolOf(mark, look_.has_utf8); }
+  void PrintCure(const Cause& cause);
+  void PrintRows(const Rows& rows);
 
   const Report& report_;
   const Look& look_;
   std::ostream& out_;
 };
 
-Colour ColourOf(Mood mood);
-std::string ShareText(const Share& share);
+std::string ShareText(const Share& share, const char* what);
 
 }  // namespace
 
@@ -61,118 +63,94 @@ void PrintReport(const Report& report, Detail detail, const Look& look, std::ost
 namespace {
 
 void Printer::PrintHead() {
-  const VerdictWords words = WordsOf(report_.verdict);
-  out_ << Coloured(words.word, ColourOf(words.mood), look_) << "  " << Shown(report_.file);
-  if (!report_.package_name.empty()) out_ << "   " << Shown(report_.package_name);
-  if (report_.signer) {
-    out_ << "   signer " << Shown(SignerText(*report_.signer, look_.has_utf8 ? "…" : "..."));
+  const VerdictWords& words = WordsOf(report_.verdict);
+  out_ << Coloured(words.word, kMoodColours[static_cast<size_t>(words.mood)], look_) << "  ";
+  std::string line = Printable(report_.file, look_);
+  for (const std::string& fact : HeadFacts(report_, look_.has_utf8 ? "…" : "...")) {
+    line += "   " + Printable(fact, look_);
   }
-  out_ << '\n';
+  out_ << line << '\n';
 }
 
 void Printer::PrintItems() {
   size_t width = 0;
   for (const Item& item : report_.items) {
-    width = std::max(width, Columns(Shown(NameOf(item))));
+    width = std::max(width, Columns(Printable(NameOf(item), look_)));
   }
   width = std::min(width, kMostName);
-  for (size_t i = 0; i < report_.items.size(); ++i) {
-    const Item& item = report_.items[i];
-    PrintItem(item, width);
-    const bool is_last = i + 1 == report_.items.size();
-    if (HasCure(item, is_last ? nullptr : &item + 1)) PrintWrapped(item.reason.cause->cure, 6);
+  for (const Item& item : report_.items) {
+    const size_t columns = Columns(Printable(NameOf(item), look_));
+    const std::string gap(width + 2 - std::min(width, columns), ' ');
+    const bool is_refused = item.state == ItemState::kRefused;
+    Print("  " + Symbol(MarkOf(item.state)) + " " + NameOf(item) + gap +
+              OutcomeOf(item, report_.verdict),
+          is_refused ? Colour::kRed : Colour::kPlain);
+    const bool is_last = &item == &report_.items.back();
+    if (HasCure(item, is_last ? nullptr : &item + 1)) PrintCure(*item.reason.cause);
   }
-}
-
-void Printer::PrintItem(const Item& item, size_t width) {
-  const std::string name = Shown(NameOf(item));
-  const std::string gap(width + 2 - std::min(width, Columns(name)), ' ');
-  const std::string text = "  " + std::string(SymbolOf(MarkOf(item.state), look_.has_utf8)) + " " +
-                           name + gap + Shown(OutcomeOf(item, report_.verdict));
-  out_ << Coloured(text, item.state == ItemState::kRefused ? Colour::kRed : Colour::kPlain, look_)
-       << '\n';
 }
 
 void Printer::PrintWarnings() {
   for (const Reason& warning : report_.warnings) {
-    out_ << Coloured("  ! " + Shown(warning.Text()), Colour::kYellow, look_) << '\n';
-    PrintWrapped(warning.cause->cure, 6);
+    Print("  ! " + warning.Text(), Colour::kYellow);
+    PrintCure(*warning.cause);
   }
-}
-
-void Printer::PrintWrapped(const std::string& text, size_t indent) {
-  const std::string margin(indent, ' ');
-  std::string line = margin;
-  size_t start = 0;
-  while (start < text.size()) {
-    const size_t end = std::min(text.find(' ', start), text.size());
-    const std::string word = text.substr(start, end - start);
-    if (line.size() > indent && line.size() + 1 + word.size() > kWidth) {
-      out_ << line << '\n';
-      line = margin;
-    }
-    line += (line.size() > indent ? " " : "") + word;
-    start = end + 1;
-  }
-  out_ << line << '\n';
-}
-
-void Printer::PrintSigner() {
-  if (!report_.signer) return;
-  out_ << "  signer\n";
-  PrintCertificate(*report_.signer, true);
-  out_ << "    schemes: " << Shown(Joined(report_.schemes)) << '\n';
-  PrintProtection();
-}
-
-void Printer::PrintCertificate(const CertificateFacts& certificate, bool is_jar_signer) {
-  for (const auto& [label, value] : CertificateRows(certificate, is_jar_signer)) {
-    out_ << "    " << label << ": " << Shown(value) << '\n';
-  }
-}
-
-void Printer::PrintNewerSigners() {
-  for (const NewerSignerFacts& signer : report_.newer) {
-    out_ << "  signer of " << Shown(signer.scheme) << '\n';
-    PrintCertificate(signer.certificate, false);
-  }
-}
-
-void Printer::PrintProtection() {
-  const Protection& all = report_.protection;
-  out_ << "    protects: " << ShareText(all.verified) << " " << kVerifiedWord << ", "
-       << ShareText(all.vouched) << " " << kVouchedWord << ", " << ShareText(all.unlisted) << " "
-       << kUnlistedWord << '\n';
 }
 
 void Printer::PrintUnlisted() {
   for (const std::string& name : report_.protection.unlisted_names) {
-    out_ << "      " << kUnlistedWord << ": " << Shown(name) << '\n';
+    Print(std::string("      ") + kUnlistedWord + ": " + name);
+  }
+}
+
+void Printer::PrintSigner() {
+  if (!report_.signer && !report_.key) return;
+  Print("  signer");
+  PrintRows(SignerRows(report_));
+  Print("    schemes: " + Joined(report_.schemes));
+  const Protection& all = report_.protection;
+  Print("    protects: " + ShareText(all.verified, kVerifiedWord) + ", " +
+        ShareText(all.vouched, kVouchedWord) + ", " + ShareText(all.unlisted, kUnlistedWord));
+}
+
+void Printer::PrintNewerSigners() {
+  for (const NewerSignerFacts& signer : report_.newer) {
+    Print("  signer of " + signer.scheme);
+    PrintRows(CertificateRows(signer.certificate));
   }
 }
 
 void Printer::PrintChain() {
   for (const Link& link : report_.chain) {
-    out_ << "    " << SymbolOf(MarkOf(link.state), look_.has_utf8) << " " << link.name << ": "
-         << Shown(TextOf(link)) << '\n';
+    Print("    " + Symbol(MarkOf(link.state)) + " " + link.name + ": " + TextOf(link));
   }
 }
 
-Colour ColourOf(Mood mood) {
-  switch (mood) {
-    case Mood::kGood:
-      return Colour::kGreen;
-    case Mood::kMixed:
-      return Colour::kYellow;
-    case Mood::kBad:
-      return Colour::kRed;
+// Wrapped, below what it is said of.
+void Printer::PrintCure(const Cause& cause) {
+  const std::string margin(6, ' ');
+  const std::string text = cause.cure;
+  std::string line = margin;
+  for (size_t start = 0; start < text.size();) {
+    const size_t end = std::min(text.find(' ', start), text.size());
+    const std::string word = text.substr(start, end - start);
+    if (line != margin && line.size() + 1 + word.size() > kWidth) {
+      Print(line);
+      line = margin;
+    }
+    line += (line == margin ? "" : " ") + word;
+    start = end + 1;
   }
-  return Colour::kPlain;
+  Print(line);
 }
 
-std::string ShareText(const Share& share) {
+void Printer::PrintRows(const Rows& rows) {
+  for (const auto& [label, value] : rows) Print("    " + label + ": " + value);
+}
+
+std::string ShareText(const Share& share, const char* what) {
   return Counted(share.entries, "entry", "entries") + " (" + Counted(share.bytes, "byte", "bytes") +
-         ")";
+         ") " + what;
 }
 
 }  // namespace

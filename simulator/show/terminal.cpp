@@ -16,23 +16,7 @@ namespace simulator {
 namespace {
 
 bool IsShown(std::string_view character, const Look& look) {
-  const uint8_t first = static_cast<uint8_t>(character[0]);
-  if (character.size() == 1) return first >= 0x20 && first != 0x7f;
-  if (!look.has_utf8) return false;
-  const uint8_t second = static_cast<uint8_t>(character[1]);
-  // U+0080 to U+009F are controls, and U+061C turns what stands around it.
-  if (character.size() == 2) {
-    return (first != 0xc2 || second >= 0xa0) && (first != 0xd8 || second != 0x9c);
-  }
-  if (character.size() > 3) return true;
-  // U+200B to U+200F, U+2028 to U+202E, U+2060 to U+206F and U+FEFF have no width or turn what
-  // stands around them.
-  const uint8_t third = static_cast<uint8_t>(character[2]);
-  if (first == 0xe2 && second == 0x80) {
-    return (third < 0x8b || third > 0x8f) && (third < 0xa8 || third > 0xae);
-  }
-  if (first == 0xe2 && second == 0x81) return third < 0xa0 || third > 0xaf;
-  return first != 0xef || second != 0xbb || third != 0xbf;
+  return (look.has_utf8 || character.size() == 1) && !IsHidden(character);
 }
 
 }  // namespace

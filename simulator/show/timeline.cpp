@@ -14,7 +14,6 @@ using nlohmann::json;
 
 using Line = TimelineLine;
 
-bool IsShown(const json& event);
 Line Describe(const json& event, const std::string& directory);
 Line DescribeLog(const json& event);
 Line DescribeIntegrity(const json& event);
@@ -32,7 +31,7 @@ std::vector<TimelineLine> MakeTimeline(const Events& events, const std::string& 
   std::vector<TimelineLine> lines;
   for (auto event = events.begin(), next = event; event != events.end(); event = next) {
     next = std::find_if(event, events.end(), [event](const json& e) { return e != *event; });
-    if (!IsShown(*event)) continue;
+    if (!IsOfTheRun(*event)) continue;
     lines.push_back(Describe(*event, directory));
     if (next - event > 1) lines.back().text += " (" + std::to_string(next - event) + " times)";
   }
@@ -45,12 +44,6 @@ void PrintTimeline(const std::vector<TimelineLine>& lines, const Look& look, std
 }
 
 namespace {
-
-// The others are there for the journal's own sake.
-bool IsShown(const json& event) {
-  const std::string kind = TextOf(event, "event");
-  return kind != "journal" && kind != "start" && kind != "attached" && kind != "verdict";
-}
 
 // Paths below `directory` are shown without it.
 Line Describe(const json& event, const std::string& directory) {
@@ -89,7 +82,7 @@ Line DescribeAnswer(const json& event, const std::string& directory) {
   const std::string kind = TextOf(event, "event");
   std::string path = TextOf(event, "path");
   if (path.compare(0, directory.size(), directory) == 0) path.erase(0, directory.size());
-  const bool is_failure = NumberOf(event, "result") != 0;
+  const bool is_failure = !IsSuccess(event);
   const std::string answer = is_failure       ? DescribeErrno(NumberOf(event, "errno"))
                              : kind == "sign" ? "signed"
                                               : "trusted";
@@ -135,7 +128,7 @@ std::string WithoutEnd(std::string text) {
 
 void PrintLine(int number, const Line& line, const Look& look, std::ostream& out) {
   char head[64];
-  snprintf(head, sizeof(head), "%4d  %-9s  ", number, line.what.c_str());
+  snprintf(head, sizeof(head), "%4d  %-9s  ", number, Printable(line.what, look).c_str());
   const Colour colour = line.is_failure ? Colour::kRed : Colour::kPlain;
   out << Coloured(head + Printable(line.text, look), colour, look) << '\n';
   if (line.detail.empty()) return;

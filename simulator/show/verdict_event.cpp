@@ -5,6 +5,7 @@
 
 #include "simulator/phone/journal.h"
 #include "simulator/phone/text.h"
+#include "simulator/show/words.h"
 
 namespace simulator {
 
@@ -28,48 +29,10 @@ std::string List(const Range& range, Function to_json) {
   return "[" + text + "]";
 }
 
-const char* CodeOf(ItemKind kind) {
-  switch (kind) {
-    case ItemKind::kPackage:
-      return "package";
-    case ItemKind::kJar:
-      return "jar";
-    case ItemKind::kFile:
-      return "file";
-    case ItemKind::kLibrary:
-      return "library";
-    case ItemKind::kKey:
-      return "key";
-    case ItemKind::kTool:
-      return "tool";
-  }
-  return "";
-}
-
 const char* StateCode(const Item& item) {
-  switch (item.state) {
-    case ItemState::kDone:
-      return item.kind == ItemKind::kKey ? "registered" : "signed";
-    case ItemState::kRefused:
-      return "refused";
-    case ItemState::kAbsent:
-      return "absent";
-    case ItemState::kNothing:
-      return "nothing-to-sign";
-  }
-  return "";
-}
-
-const char* CodeOf(LinkState state) {
-  switch (state) {
-    case LinkState::kHolds:
-      return "holds";
-    case LinkState::kBroken:
-      return "broken";
-    case LinkState::kNotReached:
-      return "not-reached";
-  }
-  return "";
+  constexpr const char* kCodes[] = {"signed", "refused", "absent", "nothing-to-sign"};
+  const bool is_registered = item.state == ItemState::kDone && item.kind == ItemKind::kKey;
+  return is_registered ? "registered" : kCodes[static_cast<size_t>(item.state)];
 }
 
 Members ReasonMembers(const Reason& reason) {
@@ -77,7 +40,9 @@ Members ReasonMembers(const Reason& reason) {
 }
 
 std::string ItemJson(const Item& item) {
-  Members members = {{"kind", EncodeText(CodeOf(item.kind))}, {"name", EncodeText(item.name)}};
+  constexpr const char* kKinds[] = {"package", "jar", "file", "entries", "library", "key", "tool"};
+  Members members = {{"kind", EncodeText(kKinds[static_cast<size_t>(item.kind)])},
+                     {"name", EncodeText(item.name)}};
   if (item.kind == ItemKind::kLibrary) members.emplace_back("entry", EncodeText(item.entry));
   members.emplace_back("state", EncodeText(StateCode(item)));
   if (item.reason.cause != nullptr) {
@@ -86,24 +51,30 @@ std::string ItemJson(const Item& item) {
   return Object(members);
 }
 
-std::string SignerJson(const std::string& scheme, const CertificateFacts& signer) {
+std::string SignerJson(const std::string& scheme, const CertificateFacts& signer,
+                       const std::string& modulus_sha256) {
   Members members = {{"scheme", EncodeText(scheme)},
                      {"subject", EncodeText(signer.subject)},
                      {"certificate_sha256", EncodeText(signer.sha256)},
                      {"key_algorithm", EncodeText(signer.key.algorithm)},
                      {"key_bits", std::to_string(signer.key.bits)},
                      {"key_sha256", EncodeText(signer.key.sha256)}};
-  if (!signer.key.modulus_sha256.empty()) {
-    members.emplace_back("modulus_sha256", EncodeText(signer.key.modulus_sha256));
-  }
+  if (!modulus_sha256.empty()) members.emplace_back("modulus_sha256", EncodeText(modulus_sha256));
   return Object(members);
 }
 
+// Of the JAR signature the key is the kernel's, whatever the certificate shows.
 std::string SignersJson(const Report& report) {
-  std::vector<NewerSignerFacts> signers;
-  if (report.signer) signers.push_back({"v1", *report.signer});
-  signers.insert(signers.end(), report.newer.begin(), report.newer.end());
-  return List(signers, [](const auto& each) { return SignerJson(each.scheme, each.certificate); });
+  std::vector<std::string> signers;
+  if (report.signer || report.key) {
+    const CertificateFacts certificate = report.signer.value_or(CertificateFacts());
+    signers.push_back(SignerJson("v1", certificate,
+                                 report.key ? report.key->sha256 : certificate.key.modulus_sha256));
+  }
+  for (const auto& [scheme, certificate] : report.newer) {
+    signers.push_back(SignerJson(scheme, certificate, certificate.key.modulus_sha256));
+  }
+  return List(signers, [](const std::string& signer) { return signer; });
 }
 
 std::string ShareJson(const Share& share) {
@@ -119,38 +90,19 @@ std::string ProtectionJson(const Protection& protection) {
 }
 
 std::string LinkJson(const Link& link) {
+  constexpr const char* kStates[] = {"holds", "broken", "not-reached"};
   return Object({{"link", EncodeText(link.name)},
-                 {"state", EncodeText(CodeOf(link.state))},
+                 {"state", EncodeText(kStates[static_cast<size_t>(link.state)])},
                  {"text", EncodeText(link.text)}});
 }
 
 }  // namespace
 
-const char* CodeOf(Verdict verdict) {
-  switch (verdict) {
-    case Verdict::kSigned:
-      return "signed";
-    case Verdict::kPartlySigned:
-      return "partly-signed";
-    case Verdict::kRefused:
-      return "refused";
-    case Verdict::kTrustedJar:
-      return "trusted-jar";
-    case Verdict::kNotTrustedJar:
-      return "not-trusted-jar";
-    case Verdict::kNotLookedAt:
-      return "not-looked-at";
-    case Verdict::kNotSimulated:
-      return "not-simulated";
-  }
-  return "";
-}
-
 std::string VerdictEvent(const Report& report) {
   Event event("verdict");
   event.Text("file", report.file).Text("path", report.path);
-  event.Text("verdict", CodeOf(report.verdict)).Number("status", StatusOf(report.verdict));
-  event.Text("package", report.package_name);
+  event.Text("verdict", WordsOf(report.verdict).code).Number("status", StatusOf(report.verdict));
+  event.Text("package", report.package_name).Text("payload", report.payload);
   event.Json("items", List(report.items, ItemJson));
   event.Json("warnings", List(report.warnings, [](const Reason& warning) {
                return Object(ReasonMembers(warning));

@@ -10,7 +10,4 @@ namespace simulator {
 // The whole line, with its end.
 std::string VerdictEvent(const Report& report);
 
-// The name of a verdict for programs, such as "partly-signed".
-const char* CodeOf(Verdict verdict);
-
 }  // namespace simulator

@@ -1,282 +1,375 @@
-// Why something was not signed, and what to do: the one table of it. Its rows stand in
-// docs/messages.md as well, word for word, and their codes in docs/journal.schema.json; a test
-// holds the three together. A code never changes its meaning: scripts go by it.
-//
-// A reason is the end of a sentence such as "not signed: …"; a cure is one or more sentences. "%s"
-// in a reason stands for what a single run fills in.
+// Why something was not signed, and what to do: the one table of it. A row says all about a cause;
+// the tables in docs/messages.md and the codes in docs/journal.schema.json are written from the
+// rows (tests/project/messages_test.py --write). A code never changes its meaning: scripts go by
+// it.
 #pragma once
 
 namespace simulator {
 
+// What a cause is about.
+enum class Group {
+  kNotLookedAt,  // the tool did not look at the file
+  kSimulation,   // the simulation could not tell
+  kFile,         // what the file is
+  kSignature,    // a package's signature
+  kKernel,
+  kLibrary,
+  kKey,
+  kTool,
+  kWarning,  // all may be signed, and yet
+};
+
+// What a cause means for the thing that it is said of.
+enum class Severity {
+  kFailed,   // nothing is told of the file
+  kUnseen,   // the tool left the file alone
+  kRefused,  // it should have been signed or registered, and was not
+  kFollows,  // the same, and something else has to be cured for it
+  kAbsent,   // there is nothing to sign; a refusal for whoever is strict
+  kNothing,  // there is nothing to sign
+  kDoubt,    // a warning; a refusal for whoever is strict
+  kWarning,
+  kAlarm,  // a warning that stands in the line of the verdict as well
+};
+
+// The links of the chain from the key to the entries, each of which vouches for the next.
+enum class ChainLink { kKey, kCertificate, kSignatureFile, kManifest, kEntries, kNone };
+
 struct Cause {
   const char* code;
-  const char* reason;
-  const char* cure;
+  Group group;
+  Severity severity;
+  ChainLink link;      // at which the cause breaks the chain; kNone: it breaks none
+  const char* log;     // the messages that it is known by, for docs/messages.md
+  const char* reason;  // the end of a sentence such as "not signed: …"; "%s" is filled in
+  const char* cure;    // one or more sentences
 };
 
 namespace cause {
 
+// The rows are filled to the line's end.
+// clang-format off
+
 // ---- The tool did not look at the file.
-inline constexpr Cause kFileMissing = {
-    "file-missing", "there is no such file",
+inline constexpr Cause kFileMissing = {"file-missing", Group::kNotLookedAt, Severity::kUnseen,
+    ChainLink::kKey, "", "there is no such file",
     "Check the name; a relative one counts from the folder in which the tool is run."};
-inline constexpr Cause kFileNoPermission = {
-    "file-no-permission", "it may not be read",
+inline constexpr Cause kFileNoPermission = {"file-no-permission", Group::kNotLookedAt,
+    Severity::kUnseen, ChainLink::kKey, "", "it may not be read",
     "Give the user who runs the tool the right to read the file and to enter its folders."};
-inline constexpr Cause kFileNotOpened = {"file-not-opened", "it cannot be opened (%s)",
-                                         "Mend what the error names, and run again."};
-inline constexpr Cause kReadOnlyFileSystem = {
-    "read-only-file-system",
+inline constexpr Cause kFileNotOpened = {"file-not-opened", Group::kNotLookedAt, Severity::kUnseen,
+    ChainLink::kKey, "", "it cannot be opened (%s)", "Fix the reported error, and run again."};
+inline constexpr Cause kReadOnlyFileSystem = {"read-only-file-system", Group::kNotLookedAt,
+    Severity::kUnseen, ChainLink::kKey, "",
     "it lies on a read-only file system, where the tool leaves every file alone",
     "Nothing, for a file of the system image. Any other: copy it to where it can be written."};
-inline constexpr Cause kStandardInputClosed = {
-    "standard-input-closed",
-    "standard input is closed, so the file got its place, descriptor 0, which the tool takes for a "
-    "failure",
+inline constexpr Cause kStandardInputClosed = {"standard-input-closed", Group::kNotLookedAt,
+    Severity::kUnseen, ChainLink::kKey, "", "standard input is closed, so the file got its place, "
+    "descriptor 0, which the tool takes for a failure",
     "Start the tool with a standard input, be it /dev/null."};
+inline constexpr Cause kFileLeased = {"file-leased", Group::kNotLookedAt, Severity::kUnseen,
+    ChainLink::kKey, "", "another process holds a lease on it",
+    "Have that process close the file, and run again; /proc/locks names it by its number."};
 
 // ---- The simulation could not tell.
-inline constexpr Cause kToolNotStarted = {"tool-not-started", "%s", "Check --tool and --runner."};
-inline constexpr Cause kToolTimedOut = {
-    "tool-timed-out", "it was still busy after %s and was stopped",
-    "The tool waits for ever while its integrity value reads ffffffff. A large file may need a "
-    "larger --timeout."};
-inline constexpr Cause kStandInsMissing = {
-    "stand-ins-missing", "the stand-ins were not loaded into %s",
+inline constexpr Cause kToolNotStarted = {"tool-not-started", Group::kSimulation, Severity::kFailed,
+    ChainLink::kKey, "", "%s", "Check --tool and --runner."};
+inline constexpr Cause kToolTimedOut = {"tool-timed-out", Group::kSimulation, Severity::kFailed,
+    ChainLink::kKey, "", "it was still busy after %s and was stopped", "The tool waits for ever "
+    "while its integrity value reads ffffffff, and for a while for who holds a lease on the file. "
+    "A large file may need a larger --timeout."};
+inline constexpr Cause kStandInsMissing = {"stand-ins-missing", Group::kSimulation,
+    Severity::kFailed, ChainLink::kKey, "", "the stand-ins were not loaded into %s",
     "Check --tool: it has to be a dynamically linked program for this processor or for --runner."};
-inline constexpr Cause kToolSilent = {
-    "tool-silent", "the tool neither said nor did anything, though the file can be opened",
+inline constexpr Cause kToolSilent = {"tool-silent", Group::kSimulation, Severity::kFailed,
+    ChainLink::kKey, "", "the tool neither said nor did anything, though the file can be opened",
     "Check --tool: it has to be apktoolkit."};
-inline constexpr Cause kStateNotKept = {"state-not-kept", "what was signed cannot be kept in %s",
-                                        "Make the --state folder writable."};
-inline constexpr Cause kNotInstalled = {"not-installed", "its libraries cannot be laid out: %s",
-                                        "Make room in the folder for temporary files (TMPDIR)."};
+inline constexpr Cause kStateNotKept = {"state-not-kept", Group::kSimulation, Severity::kFailed,
+    ChainLink::kKey, "", "what was signed cannot be kept in %s",
+    "Make the --state folder writable."};
+inline constexpr Cause kNotInstalled = {"not-installed", Group::kSimulation, Severity::kFailed,
+    ChainLink::kKey, "", "its libraries cannot be laid out: %s",
+    "Make room in the folder for temporary files (TMPDIR)."};
+inline constexpr Cause kInterrupted = {"interrupted", Group::kSimulation, Severity::kFailed,
+    ChainLink::kKey, "", "it was interrupted", "Run it again."};
 
 // ---- What the file is.
-inline constexpr Cause kFolder = {"folder", "it is a folder",
-                                  "Name the package inside it, such as base.apk."};
-inline constexpr Cause kSpecialFile = {"special-file", "it is a device, a pipe or a socket",
-                                       "Name a file."};
-inline constexpr Cause kEmptyFile = {"empty-file", "it is empty, a file of 0 bytes",
-                                     "Build, copy or download it again."};
-inline constexpr Cause kTextFile = {"text-file", "it is a text and not an archive",
-                                    "Look into it: a failed download leaves its message so."};
-inline constexpr Cause kCutArchive = {"cut-archive",
-                                      "it begins like an archive and has no end: it was cut off",
-                                      "Copy or download it again, and compare the sizes."};
-inline constexpr Cause kNoArchive = {"no-archive", "it is not a zip archive",
-                                     "Name a package or a JAR."};
-inline constexpr Cause kEmptyArchive = {"empty-archive", "it is an archive without entries",
-                                        "Build it again."};
-inline constexpr Cause kDamagedArchive = {
-    "damaged-archive", "it is a damaged archive, which the zip library does not open",
+inline constexpr Cause kFolder = {"folder", Group::kFile, Severity::kRefused, ChainLink::kKey,
+    "`OpenArchiveFd(`", "it is a folder", "Name the package inside it, such as base.apk."};
+inline constexpr Cause kSpecialFile = {"special-file", Group::kFile, Severity::kRefused,
+    ChainLink::kKey, "`OpenArchiveFd(`", "it is a device, a pipe or a socket", "Name a file."};
+inline constexpr Cause kEmptyFile = {"empty-file", Group::kFile, Severity::kRefused,
+    ChainLink::kKey, "`OpenArchiveFd(`", "it is empty, a file of 0 bytes",
+    "Build, copy or download it again."};
+inline constexpr Cause kTextFile = {"text-file", Group::kFile, Severity::kRefused, ChainLink::kKey,
+    "`OpenArchiveFd(`", "it is a text and not an archive",
+    "Look into it: a failed download leaves its message so."};
+inline constexpr Cause kCutArchive = {"cut-archive", Group::kFile, Severity::kRefused,
+    ChainLink::kKey, "`OpenArchiveFd(`", "it begins like an archive and has no end: it was cut off",
+    "Copy or download it again, and compare the sizes."};
+inline constexpr Cause kNoArchive = {"no-archive", Group::kFile, Severity::kRefused,
+    ChainLink::kKey, "`OpenArchiveFd(`", "it is not a zip archive", "Name a package or a JAR."};
+inline constexpr Cause kEmptyArchive = {"empty-archive", Group::kFile, Severity::kRefused,
+    ChainLink::kKey, "`OpenArchiveFd(`", "it is an archive without entries", "Build it again."};
+inline constexpr Cause kDamagedArchive = {"damaged-archive", Group::kFile, Severity::kRefused,
+    ChainLink::kEntries, "`OpenArchiveFd(`",
+    "it is a damaged archive, which the zip library does not open",
     "Copy or download it again. unzip -t, and the ziparchive lines of the log, name the fault."};
-inline constexpr Cause kJarNotTrusted = {
-    "jar-not-trusted",
+inline constexpr Cause kJarNotTrusted = {"jar-not-trusted", Group::kFile, Severity::kRefused,
+    ChainLink::kKey, "`VELT can't verify a file`",
     "it is a plain JAR, and those are signed only when the kernel trusts them already (%s)",
     "Nothing, unless the JAR should have come from a trusted image; --trust makes it so here."};
-inline constexpr Cause kAndroidManifestDamaged = {
-    "android-manifest-damaged",
-    "its AndroidManifest.xml cannot be extracted, so it counts as a plain JAR, which the kernel "
-    "does "
-    "not trust",
-    "Copy or build the package again; unzip -t names the damaged entry."};
+inline constexpr Cause kAndroidManifestDamaged = {"android-manifest-damaged", Group::kFile,
+    Severity::kRefused, ChainLink::kKey, "`Can't extract Android Manifest`", "its "
+    "AndroidManifest.xml cannot be extracted, so it counts as a plain JAR, which the kernel does "
+    "not trust", "Copy or build the package again; unzip -t names the damaged entry."};
 
 // ---- A package's signature.
-inline constexpr Cause kUnsigned = {"unsigned", "it is unsigned: META-INF/MANIFEST.MF is missing",
-                                    "Sign it: apksigner sign --v1-signing-enabled true."};
-inline constexpr Cause kNewerSchemeOnly = {
-    "newer-scheme-only",
-    "it is signed with %s alone, and this tool reads JAR signatures (v1): META-INF/MANIFEST.MF is "
-    "missing",
-    "Sign it with v1 as well: enableV1Signing true for the Gradle plugin, or apksigner sign "
-    "--v1-signing-enabled true --min-sdk-version 23."};
-inline constexpr Cause kManifestUnreadable = {
-    "manifest-unreadable", "META-INF/MANIFEST.MF cannot be extracted",
+inline constexpr Cause kUnsigned = {"unsigned", Group::kSignature, Severity::kRefused,
+    ChainLink::kKey, "", "it is unsigned: META-INF/MANIFEST.MF is missing",
+    "Sign it: apksigner sign --v1-signing-enabled true."};
+inline constexpr Cause kNewerSchemeOnly = {"newer-scheme-only", Group::kSignature,
+    Severity::kRefused, ChainLink::kKey, "", "it is signed with %s alone, and this tool reads JAR "
+    "signatures (v1): META-INF/MANIFEST.MF is missing", "Sign it with v1 as well: enableV1Signing "
+    "true for the Gradle plugin, or apksigner sign --v1-signing-enabled true --min-sdk-version "
+    "23."};
+inline constexpr Cause kManifestUnreadable = {"manifest-unreadable", Group::kSignature,
+    Severity::kRefused, ChainLink::kManifest, "", "META-INF/MANIFEST.MF cannot be extracted",
     "Copy or build the package again; unzip -t names the damaged entry."};
-inline constexpr Cause kSignatureFileMissing = {
-    "signature-file-missing", "there is no signature file: no entry META-INF/*.SF, in capitals",
-    "Sign the package again."};
-inline constexpr Cause kSignatureFileUnreadable = {
-    "signature-file-unreadable", "its signature file %s cannot be extracted",
+inline constexpr Cause kSignatureFileMissing = {"signature-file-missing", Group::kSignature,
+    Severity::kRefused, ChainLink::kSignatureFile, "",
+    "there is no signature file: no entry META-INF/*.SF, in capitals", "Sign the package again."};
+inline constexpr Cause kSignatureFileUnreadable = {"signature-file-unreadable", Group::kSignature,
+    Severity::kRefused, ChainLink::kSignatureFile, "", "its signature file %s cannot be extracted",
     "Copy or build the package again; unzip -t names the damaged entry."};
-inline constexpr Cause kSignatureFileMalformed = {
-    "signature-file-malformed", "its signature file %s does not parse", "Sign the package again."};
-inline constexpr Cause kSignatureBlockMissing = {
-    "signature-block-missing", "the block %s, which belongs to its signature file, is missing",
-    "Sign the package again."};
-inline constexpr Cause kSignatureBlockUnreadable = {
-    "signature-block-unreadable", "its signature block %s cannot be extracted",
+inline constexpr Cause kSignatureFileMalformed = {"signature-file-malformed", Group::kSignature,
+    Severity::kRefused, ChainLink::kSignatureFile, "`Parse manifest:`",
+    "its signature file %s does not parse", "Sign the package again."};
+inline constexpr Cause kSignatureBlockMissing = {"signature-block-missing", Group::kSignature,
+    Severity::kRefused, ChainLink::kCertificate, "`Can't extract RSA certificate`",
+    "the block %s, which belongs to its signature file, is missing", "Sign the package again."};
+inline constexpr Cause kSignatureBlockUnreadable = {"signature-block-unreadable", Group::kSignature,
+    Severity::kRefused, ChainLink::kCertificate, "`Can't extract RSA certificate`",
+    "its signature block %s cannot be extracted",
     "Copy or build the package again; unzip -t names the damaged entry."};
-inline constexpr Cause kSignatureBlockMalformed = {"signature-block-malformed",
-                                                   "its signature block %s does not parse",
-                                                   "Sign the package again with apksigner."};
-inline constexpr Cause kEcKey = {"ec-key", "its key is an EC key, and this tool knows RSA alone",
-                                 "Sign it with an RSA key of 2048 to 4096 bits."};
-inline constexpr Cause kDsaKey = {"dsa-key", "its key is a DSA key, and this tool knows RSA alone",
-                                  "Sign it with an RSA key of 2048 to 4096 bits."};
-inline constexpr Cause kKeyTooLarge = {"key-too-large",
-                                       "its RSA key has %s bits, and this tool takes at most 4096",
-                                       "Sign it with an RSA key of 2048 to 4096 bits."};
-inline constexpr Cause kKeyTooSmall = {
-    "key-too-small", "its RSA key has %s bits, and this tool takes no fewer than 128",
+inline constexpr Cause kSignatureBlockMalformed = {"signature-block-malformed", Group::kSignature,
+    Severity::kRefused, ChainLink::kCertificate,
+    "`Unknown certificate type`, `RSA could not set key`", "its signature block %s does not parse",
+    "Sign the package again with apksigner."};
+inline constexpr Cause kEcKey = {"ec-key", Group::kSignature, Severity::kRefused, ChainLink::kKey,
+    "`Can't extract RSA certificate`, `Unknown certificate type`",
+    "its key is an EC key, and this tool knows RSA alone",
     "Sign it with an RSA key of 2048 to 4096 bits."};
-inline constexpr Cause kExponentRefused = {
-    "exponent-refused",
+inline constexpr Cause kDsaKey = {"dsa-key", Group::kSignature, Severity::kRefused, ChainLink::kKey,
+    "`Can't extract RSA certificate`, `Unknown certificate type`",
+    "its key is a DSA key, and this tool knows RSA alone",
+    "Sign it with an RSA key of 2048 to 4096 bits."};
+inline constexpr Cause kKeyTooLarge = {"key-too-large", Group::kSignature, Severity::kRefused,
+    ChainLink::kKey, "`RSA could not verify certificate`",
+    "its RSA key has %s bits, and this tool takes at most 4096",
+    "Sign it with an RSA key of 2048 to 4096 bits."};
+inline constexpr Cause kKeyTooSmall = {"key-too-small", Group::kSignature, Severity::kRefused,
+    ChainLink::kKey, "`RSA could not verify certificate`",
+    "its RSA key has %s bits, and this tool takes no fewer than 128",
+    "Sign it with an RSA key of 2048 to 4096 bits."};
+inline constexpr Cause kExponentRefused = {"exponent-refused", Group::kSignature,
+    Severity::kRefused, ChainLink::kKey, "`RSA could not set key`",
     "its RSA key has the public exponent %s, with which anyone can make its signatures",
     "Do not trust this package. A key of one's own has the exponent 65537."};
-inline constexpr Cause kCertificateIssued = {
-    "certificate-issued",
+inline constexpr Cause kCertificateIssued = {"certificate-issued", Group::kSignature,
+    Severity::kRefused, ChainLink::kCertificate, "`RSA could not verify certificate`",
     "its certificate was issued by another (%s), and this tool takes self-signed ones alone",
     "Sign it with a self-signed certificate: keytool -genkeypair -keyalg RSA -sigalg "
     "SHA256withRSA."};
-inline constexpr Cause kCertificateDigest = {
-    "certificate-digest",
+inline constexpr Cause kCertificateDigest = {"certificate-digest", Group::kSignature,
+    Severity::kRefused, ChainLink::kCertificate, "`RSA could not verify certificate`",
     "its certificate is signed with %s, and this tool reads MD5, SHA-1 and SHA-256 with RSA",
     "Make a certificate for the same key with SHA-256: keytool -selfcert -sigalg SHA256withRSA. "
     "Without -sigalg keytool takes SHA-384: that of JDK 21 for every RSA key, that of JDK 17 for "
     "keys of more than 3072 bits."};
-inline constexpr Cause kCertificateChanged = {
-    "certificate-changed", "its certificate does not carry a signature by its own key",
+inline constexpr Cause kCertificateChanged = {"certificate-changed", Group::kSignature,
+    Severity::kRefused, ChainLink::kCertificate, "`RSA could not verify certificate`",
+    "its certificate does not carry a signature by its own key",
     "Sign the package again; if it comes back, make a new certificate for the key."};
-inline constexpr Cause kSignedAttributes = {
-    "signed-attributes",
-    "its signature covers signed attributes, as jarsigner writes them, and this tool does not read "
-    "those",
+inline constexpr Cause kSignedAttributes = {"signed-attributes", Group::kSignature,
+    Severity::kRefused, ChainLink::kSignatureFile, "`RSA could not verify data`", "its signature "
+    "covers signed attributes, as jarsigner writes them, and this tool does not read those",
     "Sign it with apksigner; no option of jarsigner helps."};
-inline constexpr Cause kSignatureDigest = {
-    "signature-digest", "it is signed over %s, and this tool reads MD5, SHA-1 and SHA-256",
+inline constexpr Cause kSignatureDigest = {"signature-digest", Group::kSignature,
+    Severity::kRefused, ChainLink::kSignatureFile, "`RSA could not verify data`",
+    "it is signed over %s, and this tool reads MD5, SHA-1 and SHA-256",
     "Sign it with SHA-256 and RSA PKCS#1 v1.5, as apksigner does."};
-inline constexpr Cause kSignatureFileChanged = {
-    "signature-file-changed", "its signature file %s was changed after it was signed",
+inline constexpr Cause kSignatureFileChanged = {"signature-file-changed", Group::kSignature,
+    Severity::kRefused, ChainLink::kSignatureFile, "`RSA could not verify data`",
+    "its signature file %s was changed after it was signed",
     "Sign the package again, as the last step that changes it."};
-inline constexpr Cause kSignatureWrong = {
-    "signature-wrong", "the signature in %s was not made by the key of its certificate",
-    "Sign the package again."};
-inline constexpr Cause kManifestChanged = {
-    "manifest-changed", "META-INF/MANIFEST.MF was changed after it was signed",
+inline constexpr Cause kSignatureWrong = {"signature-wrong", Group::kSignature, Severity::kRefused,
+    ChainLink::kSignatureFile, "`RSA could not verify data`",
+    "the signature in %s was not made by the key of its certificate", "Sign the package again."};
+inline constexpr Cause kManifestChanged = {"manifest-changed", Group::kSignature,
+    Severity::kRefused, ChainLink::kManifest, "`Can't validate manifest`",
+    "META-INF/MANIFEST.MF was changed after it was signed",
     "Sign the package again, as the last step that changes it."};
-inline constexpr Cause kManifestDigest = {
-    "manifest-digest",
+inline constexpr Cause kManifestDigest = {"manifest-digest", Group::kSignature, Severity::kRefused,
+    ChainLink::kManifest, "`Can't validate manifest`",
     "its signature file has no digest of the manifest that this tool reads: SHA-1 or SHA-256",
     "Sign it with SHA-256 digests, as apksigner does."};
-inline constexpr Cause kManifestMalformed = {
-    "manifest-malformed", "META-INF/MANIFEST.MF does not parse", "Sign the package again."};
-inline constexpr Cause kAndroidManifestText = {
-    "android-manifest-text", "its AndroidManifest.xml is not in the compiled form",
+inline constexpr Cause kManifestMalformed = {"manifest-malformed", Group::kSignature,
+    Severity::kRefused, ChainLink::kManifest, "`Can't load manifest`",
+    "META-INF/MANIFEST.MF does not parse", "Sign the package again."};
+inline constexpr Cause kAndroidManifestText = {"android-manifest-text", Group::kSignature,
+    Severity::kRefused, ChainLink::kManifest, "`Can't process Android Manifest`",
+    "its AndroidManifest.xml is not in the compiled form",
     "Build the package with aapt or aapt2, which compile it."};
-inline constexpr Cause kDexChanged = {
-    "dex-changed", "classes.dex is not the one that was signed",
-    "Sign the package again, as the last step that changes it. If nobody changed it: do not trust "
-    "it."};
-inline constexpr Cause kDexNotListed = {
-    "dex-not-listed", "classes.dex is not in the manifest: it was added after signing",
-    "Sign the package again, as the last step that changes it. If nobody changed it: do not trust "
-    "it."};
-inline constexpr Cause kDexDigest = {
-    "dex-digest",
+inline constexpr Cause kDexChanged = {"dex-changed", Group::kSignature, Severity::kRefused,
+    ChainLink::kEntries, "`Integrity not confirmed: classes.dex`",
+    "classes.dex is not the one that was signed", "Sign the package again, as the last step that "
+    "changes it. If nobody changed it: do not trust it."};
+inline constexpr Cause kDexNotListed = {"dex-not-listed", Group::kSignature, Severity::kRefused,
+    ChainLink::kEntries, "`Can't find file in`",
+    "classes.dex is not in the manifest: it was added after signing", "Sign the package again, as "
+    "the last step that changes it. If nobody changed it: do not trust it."};
+inline constexpr Cause kDexDigest = {"dex-digest", Group::kSignature, Severity::kRefused,
+    ChainLink::kEntries, "`verifyData:`",
     "the manifest has no digest of classes.dex that this tool reads: SHA-1 or SHA-256",
     "Sign it with SHA-256 digests, as apksigner does."};
-inline constexpr Cause kNoMemory = {"no-memory", "the tool had no memory left",
-                                    "Run it again where there is more."};
+inline constexpr Cause kNoMemory = {"no-memory", Group::kSignature, Severity::kRefused,
+    ChainLink::kCertificate, "`RSA could not`", "the tool had no memory left",
+    "Run it again where there is more."};
 
 // ---- The kernel.
-inline constexpr Cause kKernelRefused = {
-    "kernel-refused", "the kernel refused (%s)",
+inline constexpr Cause kKernelRefused = {"kernel-refused", Group::kKernel, Severity::kRefused,
+    ChainLink::kNone, "`VELT can't sign a`", "the kernel refused (%s)",
     "The file was good. docs/guide.md, \"When the kernel refuses\", says where to look."};
-inline constexpr Cause kIntegrityZero = {
-    "integrity-zero", "the tool's own integrity value settled at 0, so that it may not sign",
-    "The file was good. Look at the domain that the tool is started from: its value is to be "
-    "neither 0 nor ffffffff."};
-inline constexpr Cause kIntegrityMissing = {
-    "integrity-missing", "the tool has no integrity value: /proc/self/integrity/value is not there",
+inline constexpr Cause kIntegrityZero = {"integrity-zero", Group::kKernel, Severity::kRefused,
+    ChainLink::kNone, "`VELT can't sign a`",
+    "the tool's own integrity value settled at 0, so that it may not sign", "The file was good. "
+    "Look at the domain that the tool is started from: its value is to be neither 0 nor ffffffff."};
+inline constexpr Cause kIntegrityMissing = {"integrity-missing", Group::kKernel, Severity::kRefused,
+    ChainLink::kNone, "`VELT can't sign a`",
+    "the tool has no integrity value: /proc/self/integrity/value is not there",
     "The file was good. The kernel lacks the feature, or /proc is not mounted."};
-inline constexpr Cause kIntegrityUnreadable = {
-    "integrity-unreadable", "the tool's own integrity value reads \"%s\", which is no number",
+inline constexpr Cause kIntegrityUnreadable = {"integrity-unreadable", Group::kKernel,
+    Severity::kRefused, ChainLink::kNone, "`VELT can't sign a`",
+    "the tool's own integrity value reads \"%s\", which is no number",
     "The file was good. Look at what /proc/self/integrity/value holds on that kernel."};
 
 // ---- A library.
-inline constexpr Cause kLibraryChanged = {
-    "library-changed", "its bytes are not those that the manifest lists",
+inline constexpr Cause kLibraryChanged = {"library-changed", Group::kLibrary, Severity::kRefused,
+    ChainLink::kEntries, "`VeltSignJni: File not verified`",
+    "its bytes are not those that the manifest lists",
     "The file beside the package was changed after it was installed. Install the package again."};
-inline constexpr Cause kLibraryNotListed = {
-    "library-not-listed", "the manifest does not list it: it was added after signing",
+inline constexpr Cause kLibraryNotListed = {"library-not-listed", Group::kLibrary,
+    Severity::kRefused, ChainLink::kEntries, "`Can't find file in`",
+    "the manifest does not list it: it was added after signing",
     "Sign the package again, as the last step that changes it."};
-inline constexpr Cause kLibraryDigest = {
-    "library-digest", "the manifest has no digest of it that this tool reads: SHA-1 or SHA-256",
+inline constexpr Cause kLibraryDigest = {"library-digest", Group::kLibrary, Severity::kRefused,
+    ChainLink::kEntries, "`verifyData:`",
+    "the manifest has no digest of it that this tool reads: SHA-1 or SHA-256",
     "Sign the package with SHA-256 digests, as apksigner does."};
-inline constexpr Cause kLibraryNoPermission = {
-    "library-no-permission", "it may not be read",
+inline constexpr Cause kLibraryNoPermission = {"library-no-permission", Group::kLibrary,
+    Severity::kRefused, ChainLink::kNone, "`Can't open file`", "it may not be read",
     "Give the user who runs the tool the right to read it and to enter its folders."};
-inline constexpr Cause kLibraryNotOpened = {"library-not-opened", "it cannot be opened (%s)",
-                                            "Mend what the error names, and run again."};
-inline constexpr Cause kLibraryNoFile = {
-    "library-no-file", "what lies there is not a file, or too large to read",
+inline constexpr Cause kLibraryNotOpened = {"library-not-opened", Group::kLibrary,
+    Severity::kRefused, ChainLink::kNone, "`Can't open file`, `File %s is not opened`",
+    "it cannot be opened (%s)", "Fix the reported error, and run again."};
+inline constexpr Cause kLibraryNoFile = {"library-no-file", Group::kLibrary, Severity::kRefused,
+    ChainLink::kNone, "`Can't read file`", "what lies there is not a file, or too large to read",
     "Find out who put it there, and install the package again."};
-inline constexpr Cause kLibraryInPackage = {
-    "library-in-package", "it stays inside the package (extractNativeLibs=\"false\")",
+inline constexpr Cause kLibraryInPackage = {"library-in-package", Group::kLibrary,
+    Severity::kAbsent, ChainLink::kNone, "`Can't open file`",
+    "it stays inside the package (extractNativeLibs=\"false\")",
     "Nothing: it is loaded from the package."};
-inline constexpr Cause kLibraryNotInstalled = {
-    "library-not-installed", "no libraries for its processor lie beside the package",
-    "Nothing, where the phone is of another kind. For a package that lies alone: --install; for "
-    "all "
-    "processors: --install=all."};
-inline constexpr Cause kLibraryMissing = {
-    "library-missing", "it does not lie beside the package, where others are",
+inline constexpr Cause kLibraryNotInstalled = {"library-not-installed", Group::kLibrary,
+    Severity::kAbsent, ChainLink::kNone, "`Can't open file`",
+    "no libraries for its processor lie beside the package", "Nothing, where the phone is of "
+    "another kind. For a package that lies alone: --install; for all processors: --install=all."};
+inline constexpr Cause kLibraryMissing = {"library-missing", Group::kLibrary, Severity::kAbsent,
+    ChainLink::kNone, "`Can't open file`", "it does not lie beside the package, where others are",
     "Install the package again, unless the installer leaves it out on purpose."};
-inline constexpr Cause kLibraryOtherAbi = {
-    "library-other-abi", "no phone of this kind installs it",
+inline constexpr Cause kLibraryOtherAbi = {"library-other-abi", Group::kLibrary, Severity::kNothing,
+    ChainLink::kNone, "", "no phone of this kind installs it",
     "Nothing: this tool knows arm64-v8a, armeabi-v7a and armeabi."};
-inline constexpr Cause kPackageRefused = {"package-refused", "the package is refused",
-                                          "Mend the package; this follows."};
-inline constexpr Cause kNotReached = {"not-reached", "the tool did not come to it",
-                                      "See why the tool ended early."};
+inline constexpr Cause kPackageRefused = {"package-refused", Group::kLibrary, Severity::kFollows,
+    ChainLink::kNone, "`VeltSignJni: malformed apk`, `Apk archive is not valid`",
+    "the package is refused", "Fix what the package is refused for; this follows."};
+inline constexpr Cause kNotReached = {"not-reached", Group::kLibrary, Severity::kFollows,
+    ChainLink::kEntries, "", "the tool did not come to it", "See why the tool ended early."};
+inline constexpr Cause kLibraryLeased = {"library-leased", Group::kLibrary, Severity::kRefused,
+    ChainLink::kNone, "`Can't open file`", "another process holds a lease on it",
+    "Have that process close the file, and run again; /proc/locks names it by its number."};
+inline constexpr Cause kLibraryNotExtracted = {"library-not-extracted", Group::kLibrary,
+    Severity::kRefused, ChainLink::kEntries, "", "--install cannot extract it from the package",
+    "Copy or build the package again; unzip -t names the fault."};
+inline constexpr Cause kLibraryBehindDamage = {"library-behind-damage", Group::kLibrary,
+    Severity::kRefused, ChainLink::kNone, "",
+    "the tool did not come to it: a damaged entry ends its walk over the libraries",
+    "Copy or build the package again; unzip -t names the damaged entry."};
 
 // ---- The key.
-inline constexpr Cause kRegistrationRefused = {
-    "registration-refused", "libzu answered %s",
+inline constexpr Cause kRegistrationRefused = {"registration-refused", Group::kKey,
+    Severity::kRefused, ChainLink::kNone, "`ZuNewCertificate failed`", "libzu answered %s",
     "The code is the library's own. What was signed stays signed."};
-inline constexpr Cause kRegistrationNoPath = {"registration-no-path",
-                                              "its path cannot be found out",
-                                              "Check that /proc is mounted and can be read."};
+inline constexpr Cause kRegistrationNoPath = {"registration-no-path", Group::kKey,
+    Severity::kRefused, ChainLink::kNone, "`Can't get jar location`",
+    "its path cannot be found out", "Check that /proc is mounted and can be read."};
 
 // ---- The tool itself.
-inline constexpr Cause kToolKilled = {"tool-killed", "it was killed by signal %s",
-                                      "Report it, with the file."};
-inline constexpr Cause kToolFailed = {"tool-failed", "it ended with status %s",
-                                      "Check --tool: apktoolkit ends with 0 for every file."};
-inline constexpr Cause kToolError = {"tool-error", "it logged an error: %s",
-                                     "docs/messages.md has every message."};
+inline constexpr Cause kToolKilled = {"tool-killed", Group::kTool, Severity::kRefused,
+    ChainLink::kNone, "", "it was killed by signal %s", "Report it, with the file."};
+inline constexpr Cause kToolFailed = {"tool-failed", Group::kTool, Severity::kRefused,
+    ChainLink::kNone, "", "it ended with status %s",
+    "Check --tool: apktoolkit ends with 0 for every file."};
+inline constexpr Cause kToolError = {"tool-error", Group::kTool, Severity::kRefused,
+    ChainLink::kEntries, "", "it logged an error: %s", "docs/messages.md has every message."};
 
 // ---- Warnings: all may be signed, and yet.
-inline constexpr Cause kOtherKey = {
-    "other-key",
-    "%s is of another key than the JAR signature: phones install the package for that key, and the "
-    "kernel gets this one",
-    "Sign it with one key for all schemes; a rotated key reaches the newer ones alone. If it is "
-    "not "
-    "of your making: do not trust it."};
-inline constexpr Cause kSchemesStripped = {
-    "schemes-stripped",
-    "the signature file says that the package is signed with %s as well, and it is not: phones do "
-    "not install it",
+inline constexpr Cause kOtherKey = {"other-key", Group::kWarning, Severity::kWarning,
+    ChainLink::kNone, "", "%s is of another key than the JAR signature: phones install the package "
+    "for that key, and the kernel gets this one", "Sign it with one key for all schemes; a rotated "
+    "key reaches the newer ones alone. If it is not of your making: do not trust it."};
+inline constexpr Cause kSchemesStripped = {"schemes-stripped", Group::kWarning, Severity::kWarning,
+    ChainLink::kNone, "", "the signature file says that the package is signed with %s as well, and "
+    "it is not: phones do not install it",
     "Sign the package again, as the last step that changes it."};
-inline constexpr Cause kSigningBlockDamaged = {"signing-block-damaged",
-                                               "the block of the schemes after v1 does not read",
-                                               "Sign the package again."};
-inline constexpr Cause kSeveralSigners = {
-    "several-signers", "it has more than one signer; the kernel gets the key of %s alone",
+inline constexpr Cause kSigningBlockDamaged = {"signing-block-damaged", Group::kWarning,
+    Severity::kWarning, ChainLink::kNone, "", "the block of the schemes after v1 does not read",
+    "Sign the package again."};
+inline constexpr Cause kSeveralSigners = {"several-signers", Group::kWarning, Severity::kWarning,
+    ChainLink::kNone, "", "it has more than one signer; the kernel gets the key of %s alone",
     "Sign it with one key."};
-inline constexpr Cause kForgeableKey = {
-    "forgeable-key", "the key has the public exponent %s: anyone can make its signatures",
+inline constexpr Cause kForgeableKey = {"forgeable-key", Group::kWarning, Severity::kWarning,
+    ChainLink::kNone, "", "the key has the public exponent %s: anyone can make its signatures",
     "Do not trust this package. A key of one's own has the exponent 65537."};
-inline constexpr Cause kUnlistedEntries = {
-    "unlisted-entries", "the signature does not protect %s: no digest in the manifest",
+inline constexpr Cause kUnlistedEntries = {"unlisted-entries", Group::kWarning, Severity::kWarning,
+    ChainLink::kNone, "", "the signature does not protect %s: no digest in the manifest",
     "Sign the package again, as the last step that changes it; --verbose lists them."};
-inline constexpr Cause kNotLaidOut = {
-    "not-laid-out", "--install leaves out %s",
+inline constexpr Cause kNotLaidOut = {"not-laid-out", Group::kWarning, Severity::kWarning,
+    ChainLink::kNone, "", "--install leaves out %s",
     "An installer takes files of the form lib/ABI/NAME that can be extracted."};
+inline constexpr Cause kCertificateOtherKey = {"certificate-other-key", Group::kWarning,
+    Severity::kAlarm, ChainLink::kNone, "",
+    "its certificate shows another key than the tool reads: %s", "Do not trust this package, if it "
+    "is not of your making: others take its key for another one."};
+inline constexpr Cause kBlockAmbiguous = {"block-ambiguous", Group::kWarning, Severity::kAlarm,
+    ChainLink::kNone, "",
+    "others may read another signer in its signature block than the tool does: %s",
+    "Sign the package again with apksigner. If it is not of your making: do not trust it."};
+inline constexpr Cause kOtherPackageName = {"other-package-name", Group::kWarning, Severity::kAlarm,
+    ChainLink::kNone, "", "phones install it as %s, and the tool reads that other package name",
+    "Build the package again with aapt or aapt2. If it is not of your making: do not trust it."};
+inline constexpr Cause kFileChanged = {"file-changed", Group::kWarning, Severity::kAlarm,
+    ChainLink::kNone, "",
+    "it was changed while it was looked at, so that what is told of it may be of other bytes",
+    "Run again when nobody writes to it."};
+inline constexpr Cause kNotLookedInto = {"not-looked-into", Group::kWarning, Severity::kAlarm,
+    ChainLink::kNone, "", "%s is too large to be looked into, and nothing is told of it",
+    "Do not trust this package, if it is not of your making: those of real packages are small."};
+inline constexpr Cause kEntriesDamaged = {"entries-damaged", Group::kWarning, Severity::kDoubt,
+    ChainLink::kNone, "", "the archive is damaged at %s, which nobody can read",
+    "Copy or build the package again; unzip -t names the fault."};
 
+// clang-format on
 }  // namespace cause
 
 }  // namespace simulator

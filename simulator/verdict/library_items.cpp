@@ -1,51 +1,45 @@
-#include "simulator/verdict/library_items.h"
-
-#include <sys/stat.h>
-
+// A package's native libraries.
+#include <algorithm>
 #include <cerrno>
 #include <cstdio>
+
+#include "simulator/verdict/parts.h"
 
 namespace simulator {
 
 namespace {
 
-// A library that the tool takes up, and what came of it; null when the tool did not say.
+// A library of the package, and what the tool made of it; null when it did not say.
 struct Library {
-  std::string entry;
-  std::string place;
+  LibraryFacts facts;
   const Attempt* attempt = nullptr;
 };
 
-std::vector<Library> MatchAttempts(const RunRecord& run, const PackageFacts& facts);
-Item LibraryItem(const Library& library, const RunRecord& run, const PackageFacts& facts,
-                 bool is_strict);
-Reason WhyNotVerified(const Attempt& attempt, const std::string& place, const RunRecord& run,
-                      const PackageFacts& facts);
-Reason WhyNotThere(const std::string& place, const RunRecord& run, const PackageFacts& facts);
-bool IsAbsent(const Reason& reason);
-std::string FolderOf(const std::string& path);
+std::vector<Library> MatchAttempts(const RunRecord& run, const std::vector<LibraryFacts>& present);
+Reason WhyNotSigned(const Library& library, const RunRecord& run, const PackageFacts& facts,
+                    bool is_walked);
+Reason WhyNotVerified(const Library& library, const PackageFacts& facts);
+Reason WhyNotThere(const LibraryFacts& library, const PackageFacts& facts);
 
 }  // namespace
 
-void AddLibraryItems(const RunRecord& run, const PackageFacts& facts, const Item& own,
-                     bool is_strict, std::vector<Item>* items) {
-  // A JAR's entries are nobody's libraries.
-  if (own.kind != ItemKind::kPackage) return;
-  const bool is_walked = own.state == ItemState::kDone || run.own || !run.libraries.empty();
-  for (const Library& library : MatchAttempts(run, facts)) {
-    if (library.place.empty()) {
-      items->push_back({ItemKind::kLibrary,
-                        library.entry,
-                        library.entry,
-                        ItemState::kNothing,
-                        {&cause::kLibraryOtherAbi, ""}});
-    } else if (library.attempt == nullptr) {
-      const Cause& why = is_walked ? cause::kNotReached : cause::kPackageRefused;
-      items->push_back(
-          {ItemKind::kLibrary, library.place, library.entry, ItemState::kRefused, {&why, ""}});
-    } else {
-      items->push_back(LibraryItem(library, run, facts, is_strict));
-    }
+void AddLibraryItems(const RunRecord& run, const PackageFacts& facts, const JudgeOptions& options,
+                     std::vector<Item>* items) {
+  const bool is_walked = run.own || !run.libraries.empty();
+  // A JAR's entries are nobody's libraries; what the tool took up is told of in any case.
+  const bool is_package = items->front().kind == ItemKind::kPackage;
+  for (const Library& library :
+       MatchAttempts(run, is_package ? facts.libraries : std::vector<LibraryFacts>())) {
+    const LibraryFacts& found = library.facts;
+    const std::string& name = found.place.empty() ? found.entry : found.place;
+    const Reason reason = WhyNotSigned(library, run, facts, is_walked);
+    Item item = {ItemKind::kLibrary, name, "", ItemState::kDone, {}};
+    if (reason.cause != nullptr) item = NotDone(ItemKind::kLibrary, name, reason, options);
+    item.entry = found.entry;
+    // What was compared is not the same, or it comes before the kernel.
+    item.is_verified =
+        library.attempt != nullptr && library.attempt->outcome != Attempt::Outcome::kNotVerified;
+    items->push_back(item);
   }
 }
 
@@ -63,103 +57,75 @@ Reason WhyKernelDidNotSign(const Attempt& attempt) {
   return {&cause::kIntegrityZero, ""};
 }
 
-// The first row whose folder the name begins with wins; nothing need follow it.
-std::string InstalledPlace(const std::string& entry) {
-  constexpr struct {
-    const char* prefix;
-    const char* folder;
-  } kFolders[] = {{"lib/armeabi-v7a", "lib/arm"},
-                  {"lib/armeabi-v8a", "lib/arm64"},
-                  {"lib/arm64-v8a", "lib/arm64"},
-                  {"lib/armeabi", "lib/arm"}};
-  for (const auto& row : kFolders) {
-    const std::string prefix = row.prefix;
-    if (entry.compare(0, prefix.size(), prefix) == 0) {
-      return row.folder + entry.substr(prefix.size());
-    }
-  }
-  return {};
-}
-
 namespace {
 
 // The tool takes the libraries up in the order of the archive, which is known from the file. Where
 // that does not fit what it did, the paths that it named are all there is to go by.
-std::vector<Library> MatchAttempts(const RunRecord& run, const PackageFacts& facts) {
+std::vector<Library> MatchAttempts(const RunRecord& run, const std::vector<LibraryFacts>& present) {
   std::vector<Library> libraries;
-  size_t expected = 0;
-  for (const ArchiveEntry& entry : facts.libraries) {
-    libraries.push_back({entry.name, InstalledPlace(entry.name), nullptr});
-    if (!libraries.back().place.empty()) ++expected;
+  auto attempt = run.libraries.begin();
+  for (const LibraryFacts& library : present) {
+    libraries.push_back({library, nullptr});
+    const bool is_taken_up = library.is_met && !library.place.empty();
+    if (is_taken_up && attempt != run.libraries.end()) libraries.back().attempt = &*attempt++;
   }
-  // A package is refused as a whole, or else each library is taken up.
-  if (run.libraries.size() <= expected) {
-    auto attempt = run.libraries.begin();
-    for (Library& library : libraries) {
-      if (library.place.empty() || attempt == run.libraries.end()) continue;
-      library.attempt = &*attempt++;
-    }
-    return libraries;
-  }
+  if (attempt == run.libraries.end()) return libraries;
   libraries.clear();
-  const std::string folder = FolderOf(run.path);
-  for (const Attempt& attempt : run.libraries) {
-    const bool is_below = attempt.path.compare(0, folder.size(), folder) == 0;
-    const std::string place = is_below ? attempt.path.substr(folder.size()) : attempt.path;
-    libraries.push_back({"", place, &attempt});
+  const std::string directory = run.path.substr(0, run.path.rfind('/') + 1);
+  for (const Attempt& each : run.libraries) {
+    const bool is_below = each.path.compare(0, directory.size(), directory) == 0;
+    Library library;
+    library.facts.place = is_below ? each.path.substr(directory.size()) : each.path;
+    library.attempt = &each;
+    libraries.push_back(library);
   }
   return libraries;
 }
 
-Item LibraryItem(const Library& library, const RunRecord& run, const PackageFacts& facts,
-                 bool is_strict) {
-  const Attempt& attempt = *library.attempt;
-  Item item = {ItemKind::kLibrary, library.place, library.entry, ItemState::kRefused, {}};
-  if (attempt.outcome == Attempt::Outcome::kNotVerified) {
-    item.reason = WhyNotVerified(attempt, library.place, run, facts);
-  } else if (attempt.outcome == Attempt::Outcome::kNotOpened) {
-    item.reason = {&cause::kLibraryNotOpened, DescribeErrno(attempt.error)};
-  } else {
-    item.reason = WhyKernelDidNotSign(attempt);
+// A null cause when it was signed.
+Reason WhyNotSigned(const Library& library, const RunRecord& run, const PackageFacts& facts,
+                    bool is_walked) {
+  const LibraryFacts& found = library.facts;
+  const auto& lost = run.not_extracted;
+  if (std::find(lost.begin(), lost.end(), found.entry) != lost.end()) {
+    return {&cause::kLibraryNotExtracted, ""};
   }
-  if (item.reason.cause == nullptr) item.state = ItemState::kDone;
-  if (!is_strict && IsAbsent(item.reason)) item.state = ItemState::kAbsent;
-  return item;
+  if (library.attempt != nullptr) {
+    const Attempt& attempt = *library.attempt;
+    if (attempt.outcome == Attempt::Outcome::kNotVerified) return WhyNotVerified(library, facts);
+    if (attempt.outcome == Attempt::Outcome::kVanished) {
+      return {&cause::kLibraryNotOpened, DescribeErrno(attempt.error)};
+    }
+    return WhyKernelDidNotSign(attempt);
+  }
+  if (found.place.empty()) return {&cause::kLibraryOtherAbi, ""};
+  if (!is_walked) return {&cause::kPackageRefused, ""};
+  if (found.is_met) return {&cause::kNotReached, ""};
+  if (found.error != 0) return WhyNotThere(found, facts);
+  return {&cause::kLibraryBehindDamage, ""};
 }
 
-Reason WhyNotVerified(const Attempt& attempt, const std::string& place, const RunRecord& run,
-                      const PackageFacts& facts) {
-  for (const std::string& line : attempt.errors) {
-    if (Between(line, "Can't open file: ", "")) return WhyNotThere(place, run, facts);
-    if (Between(line, "Can't read file: ", "")) return {&cause::kLibraryNoFile, ""};
-    if (Between(line, "Can't find file in ", "")) return {&cause::kLibraryNotListed, ""};
-    if (Between(line, "verifyData: ", "")) return {&cause::kLibraryDigest, ""};
-  }
+Reason WhyNotVerified(const Library& library, const PackageFacts& facts) {
+  const LogMeaning why = library.attempt->why;
+  if (why == LogMeaning::kFileNotOpened) return WhyNotThere(library.facts, facts);
+  if (why == LogMeaning::kFileNotRead) return {&cause::kLibraryNoFile, ""};
+  if (why == LogMeaning::kNotListed) return {&cause::kLibraryNotListed, ""};
+  if (why == LogMeaning::kDigestUnknown) return {&cause::kLibraryDigest, ""};
   return {&cause::kLibraryChanged, ""};
 }
 
-// The tool does not log why a file does not open; the file system still knows.
-Reason WhyNotThere(const std::string& place, const RunRecord& run, const PackageFacts& facts) {
-  const std::string path = FolderOf(run.path) + place;
-  struct stat state = {};
-  if (stat(path.c_str(), &state) == 0) return {&cause::kLibraryNoPermission, ""};
-  const int error = errno;
-  if (error == EACCES) return {&cause::kLibraryNoPermission, ""};
+// The tool does not log why a file does not open; the file system still knew.
+Reason WhyNotThere(const LibraryFacts& library, const PackageFacts& facts) {
+  const int error = library.error;
+  if (error == EACCES || error == EPERM) return {&cause::kLibraryNoPermission, ""};
+  if (error == EWOULDBLOCK) return {&cause::kLibraryLeased, ""};
+  if (error == 0) return {&cause::kLibraryNotOpened, "why is not known"};
   if (error != ENOENT && error != ENOTDIR) {
     return {&cause::kLibraryNotOpened, DescribeErrno(error)};
   }
   if (facts.manifest.extracts_libraries == false) return {&cause::kLibraryInPackage, ""};
-  const bool has_folder = stat(FolderOf(path).c_str(), &state) == 0;
-  return {has_folder ? &cause::kLibraryMissing : &cause::kLibraryNotInstalled, ""};
+  return {library.has_directory ? &cause::kLibraryMissing : &cause::kLibraryNotInstalled, ""};
 }
-
-bool IsAbsent(const Reason& reason) {
-  return reason.cause == &cause::kLibraryInPackage ||
-         reason.cause == &cause::kLibraryNotInstalled || reason.cause == &cause::kLibraryMissing;
-}
-
-// With its "/" at the end; empty when there is none.
-std::string FolderOf(const std::string& path) { return path.substr(0, path.rfind('/') + 1); }
 
 }  // namespace
 

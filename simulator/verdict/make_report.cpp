@@ -1,27 +1,26 @@
 #include "simulator/verdict/make_report.h"
 
+#include <ziparchive/zip_archive.h>
+
 #include <algorithm>
 
+#include "apk/zip_library.h"
 #include "sign/libzu.h"
-#include "simulator/verdict/library_items.h"
-#include "simulator/verdict/package_reason.h"
-#include "simulator/verdict/protection.h"
-#include "simulator/verdict/warnings.h"
+#include "simulator/verdict/parts.h"
 
 namespace simulator {
 
 namespace {
 
-Item OwnItem(const RunRecord& run, const PackageFacts& facts);
+Item OwnItem(const RunRecord& run, const PackageFacts& facts, const JudgeOptions& options);
 ItemKind KindOf(const RunRecord& run);
 Reason WhyJarRefused(const RunRecord& run);
 Reason WhyFailed(const Failure& failure);
-Reason WhyToolIsAnother(const RunRecord& run);
-void AddKeyItems(const RunRecord& run, std::vector<Item>* items);
-void AddToolItems(const RunRecord& run, const Item& own, std::vector<Item>* items);
+void AddKeyItems(const RunRecord& run, const JudgeOptions& options, std::vector<Item>* items);
+void AddToolItems(const RunRecord& run, const JudgeOptions& options, std::vector<Item>* items);
 Verdict Judge(const std::vector<Item>& items);
-void DescribeSigners(const PackageFacts& facts, Report* report);
-Item Refused(ItemKind kind, const std::string& name, const Reason& reason);
+void DescribeSigners(const RunRecord& run, const PackageFacts& facts, Report* report);
+void AddWarnings(const std::vector<Reason>& warnings, const JudgeOptions& options, Report* report);
 
 }  // namespace
 
@@ -31,33 +30,43 @@ Report MakeReport(const RunRecord& run, const PackageFacts& facts, const JudgeOp
   report.path = run.path;
   report.events = run.events;
   report.file_size = facts.size;
-  if (run.failure.kind != Failure::Kind::kNone) {
-    report.verdict = Verdict::kNotSimulated;
-    report.items = {Refused(ItemKind::kTool, "tool", WhyFailed(run.failure))};
+  Reason failure = WhyFailed(run.failure);
+  if (failure.cause == nullptr && run.is_silent && !run.signal) {
+    const Reason unseen = WhyNotLookedAt(facts, run.has_standard_input);
+    if (run.status != 0) {
+      failure = {&cause::kToolFailed, std::to_string(run.status)};
+    } else if (unseen.cause == nullptr) {
+      failure = {&cause::kToolSilent, ""};
+    } else {
+      report.verdict = Verdict::kNotLookedAt;
+      report.items = {NotDone(ItemKind::kFile, "file", unseen, options)};
+      return report;
+    }
+  }
+  if (failure.cause != nullptr) {
+    report.items = {NotDone(ItemKind::kTool, "tool", failure, options)};
     return report;
   }
-  if (run.is_silent && !run.signal) {
-    Reason reason;
-    if (run.status == 0) reason = WhyNotLookedAt(facts, run.has_standard_input);
-    const bool is_known = reason.cause != nullptr;
-    report.verdict = is_known ? Verdict::kNotLookedAt : Verdict::kNotSimulated;
-    report.items = {is_known ? Refused(ItemKind::kFile, "file", reason)
-                             : Refused(ItemKind::kTool, "tool", WhyToolIsAnother(run))};
-    return report;
-  }
-  const Item own = OwnItem(run, facts);
-  report.items = {own};
-  AddLibraryItems(run, facts, own, options.is_strict, &report.items);
-  AddKeyItems(run, &report.items);
-  AddToolItems(run, own, &report.items);
+  report.items = {OwnItem(run, facts, options)};
+  const Item own = report.items[0];
+  AddLibraryItems(run, facts, options, &report.items);
+  AddKeyItems(run, options, &report.items);
+  AddToolItems(run, options, &report.items);
+  DescribeSigners(run, facts, &report);
+  AddWarnings(FindWarnings(run, facts, report), options, &report);
   report.verdict = Judge(report.items);
-  DescribeSigners(facts, &report);
-  report.warnings = FindWarnings(facts, own, run.not_laid_out);
   report.protection = FindProtection(facts, report.items);
-  if (own.kind == ItemKind::kPackage) {
-    report.chain = MakeChain(facts, report.items, report.protection.verified);
-  }
+  if (own.kind == ItemKind::kPackage) report.chain = MakeChain(facts, report);
   return report;
+}
+
+Item NotDone(ItemKind kind, const std::string& name, const Reason& reason,
+             const JudgeOptions& options) {
+  ItemState state = ItemState::kRefused;
+  if (reason.cause->severity == Severity::kNothing) state = ItemState::kNothing;
+  const bool is_absent = reason.cause->severity == Severity::kAbsent;
+  if (is_absent && !options.is_strict) state = ItemState::kAbsent;
+  return {kind, name, "", state, reason};
 }
 
 std::string Reason::Text() const {
@@ -67,114 +76,88 @@ std::string Reason::Text() const {
   return at == std::string::npos ? text : text.replace(at, 2, detail);
 }
 
-int StatusOf(Verdict verdict) {
-  switch (verdict) {
-    case Verdict::kSigned:
-    case Verdict::kTrustedJar:
-      return 0;
-    case Verdict::kPartlySigned:
-    case Verdict::kRefused:
-    case Verdict::kNotTrustedJar:
-      return 1;
-    case Verdict::kNotSimulated:
-      return 3;
-    case Verdict::kNotLookedAt:
-      return 4;
-  }
-  return 3;
+ExitStatus StatusOf(Verdict verdict) {
+  constexpr ExitStatus kStatuses[] = {kAllSigned,   kAllSigned,   kSomeRefused,   kSomeRefused,
+                                      kSomeRefused, kNotLookedAt, kCannotSimulate};
+  return kStatuses[static_cast<size_t>(verdict)];
 }
 
 namespace {
 
-Item Refused(ItemKind kind, const std::string& name, const Reason& reason) {
-  return {kind, name, "", ItemState::kRefused, reason};
-}
-
 // The file itself.
-Item OwnItem(const RunRecord& run, const PackageFacts& facts) {
+Item OwnItem(const RunRecord& run, const PackageFacts& facts, const JudgeOptions& options) {
   const ItemKind kind = KindOf(run);
-  const char* const name = kind == ItemKind::kPackage ? "package"
-                           : kind == ItemKind::kJar   ? "JAR"
-                                                      : "file";
-  if (run.verify_error.value_or(0) != 0) return Refused(kind, name, WhyJarRefused(run));
-  if (run.own) {
-    const Reason reason = WhyKernelDidNotSign(*run.own);
-    const ItemState state = reason.cause == nullptr ? ItemState::kDone : ItemState::kRefused;
-    return {kind, name, "", state, reason};
+  constexpr const char* kNames[] = {"package", "JAR", "file"};
+  const char* const name = kNames[static_cast<size_t>(kind)];
+  Reason reason;
+  if (run.verify_error.value_or(0) != 0) {
+    reason = WhyJarRefused(run);
+  } else if (run.own) {
+    reason = WhyKernelDidNotSign(*run.own);
+  } else if (run.signal) {
+    reason = {&cause::kNotReached, ""};
+  } else {
+    reason = run.is_jar ? WhyJarRefused(run) : WhyRefused(run, facts);
   }
-  if (run.signal) return Refused(kind, name, {&cause::kNotReached, ""});
-  return Refused(kind, name, run.is_jar ? WhyJarRefused(run) : WhyRefused(run, facts));
+  Item item = {kind, name, "", ItemState::kDone, {}};
+  if (reason.cause != nullptr) item = NotDone(kind, name, reason, options);
+  // The kernel is asked for what was verified.
+  item.is_verified = kind == ItemKind::kPackage && run.own.has_value();
+  return item;
 }
 
 // As the tool saw it: what it could not open is neither package nor JAR, and a JAR gets no data.
 ItemKind KindOf(const RunRecord& run) {
   constexpr char kNoData[] = "0000";
   if (run.is_jar || (run.own && run.own->payload == kNoData)) return ItemKind::kJar;
-  const auto& errors = run.opening_errors;
-  const bool is_no_archive = std::any_of(errors.begin(), errors.end(), [](const auto& line) {
-    return Between(line, "OpenArchiveFd(", "").has_value();
-  });
-  return is_no_archive ? ItemKind::kFile : ItemKind::kPackage;
+  const bool is_archive = FindError(run.opening_errors, LogMeaning::kNoArchive) == nullptr;
+  return is_archive ? ItemKind::kPackage : ItemKind::kFile;
 }
 
 Reason WhyJarRefused(const RunRecord& run) {
-  for (const std::string& line : run.opening_errors) {
-    const auto why = Between(line, "Can't extract Android Manifest: ", "");
-    if (why && *why != "Entry not found") return {&cause::kAndroidManifestDamaged, ""};
+  const LogLine* const line = FindError(run.opening_errors, LogMeaning::kNoAndroidManifest);
+  if (line != nullptr && line->text != ErrorCodeString(ApkTools::kZipEntryNotFound)) {
+    return {&cause::kAndroidManifestDamaged, ""};
   }
   return {&cause::kJarNotTrusted, DescribeErrno(run.verify_error.value_or(0))};
 }
 
+// A null cause when nothing failed.
 Reason WhyFailed(const Failure& failure) {
-  switch (failure.kind) {
-    case Failure::Kind::kNone:
-      break;
-    case Failure::Kind::kNotStarted:
-      return {&cause::kToolNotStarted, failure.detail};
-    case Failure::Kind::kTimedOut:
-      return {&cause::kToolTimedOut, failure.detail};
-    case Failure::Kind::kStandInsMissing:
-      return {&cause::kStandInsMissing, failure.detail};
-    case Failure::Kind::kStateNotKept:
-      return {&cause::kStateNotKept, failure.detail};
-    case Failure::Kind::kNotInstalled:
-      return {&cause::kNotInstalled, failure.detail};
-  }
-  return {};
+  constexpr const Cause* kCauses[] = {nullptr,
+                                      &cause::kToolNotStarted,
+                                      &cause::kToolTimedOut,
+                                      &cause::kInterrupted,
+                                      &cause::kStandInsMissing,
+                                      &cause::kStateNotKept,
+                                      &cause::kNotInstalled};
+  return {kCauses[static_cast<size_t>(failure.kind)], failure.detail};
 }
 
-// Of a run without a word: what ends with another status than 0 is not the tool either.
-Reason WhyToolIsAnother(const RunRecord& run) {
-  if (run.status == 0) return {&cause::kToolSilent, ""};
-  return {&cause::kToolFailed, std::to_string(run.status)};
-}
-
-void AddKeyItems(const RunRecord& run, std::vector<Item>* items) {
-  for (const auto& registration : run.registrations) {
-    if (IsZuSuccess(static_cast<int>(registration.result))) {
-      items->push_back({ItemKind::kKey, registration.name, "", ItemState::kDone, {}});
+void AddKeyItems(const RunRecord& run, const JudgeOptions& options, std::vector<Item>* items) {
+  const auto add = [&](const std::string& name, const Reason& reason) {
+    items->push_back(NotDone(ItemKind::kKey, name, reason, options));
+  };
+  for (const auto& [name, answer] : run.registrations) {
+    const int result = static_cast<int>(answer);
+    if (IsZuSuccess(result)) {
+      items->push_back({ItemKind::kKey, name, "", ItemState::kDone, {}});
     } else {
-      items->push_back(Refused(
-          ItemKind::kKey, registration.name,
-          {&cause::kRegistrationRefused, std::to_string(static_cast<int>(registration.result))}));
+      add(name, {&cause::kRegistrationRefused, std::to_string(result)});
     }
   }
-  if (run.is_key_refused_with_package) {
-    items->push_back(Refused(ItemKind::kKey, "", {&cause::kPackageRefused, ""}));
-  }
-  if (run.has_no_key_path) {
-    items->push_back(Refused(ItemKind::kKey, "", {&cause::kRegistrationNoPath, ""}));
-  }
+  if (run.is_key_refused_with_package) add("", {&cause::kPackageRefused, ""});
+  if (run.has_no_key_path) add("", {&cause::kRegistrationNoPath, ""});
 }
 
 // What else went wrong. What was logged while the file was opened is the reason why a package was
 // refused, or what a JAR lacks of a package; beside a package that was signed it is neither.
-void AddToolItems(const RunRecord& run, const Item& own, std::vector<Item>* items) {
-  const auto add = [items](const Reason& reason) {
-    items->push_back(Refused(ItemKind::kTool, "tool", reason));
+void AddToolItems(const RunRecord& run, const JudgeOptions& options, std::vector<Item>* items) {
+  const auto add = [&](const Reason& reason) {
+    items->push_back(NotDone(ItemKind::kTool, "tool", reason, options));
   };
-  if (own.kind != ItemKind::kJar && run.own) {
-    for (const std::string& line : run.opening_errors) add({&cause::kToolError, line});
+  if (items->front().kind != ItemKind::kJar && run.own) {
+    for (const LogLine& line : run.opening_errors) add({&cause::kToolError, line.whole});
   }
   for (const std::string& line : run.other_errors) add({&cause::kToolError, line});
   if (run.signal) {
@@ -190,9 +173,8 @@ Verdict Judge(const std::vector<Item>& items) {
   const auto is_signed = [](const Item& item) {
     return item.state == ItemState::kDone && item.kind != ItemKind::kKey;
   };
-  const Item& own = items[0];
-  const bool is_jar = own.kind == ItemKind::kJar;
-  if (is_jar && own.reason.cause == &cause::kJarNotTrusted) return Verdict::kNotTrustedJar;
+  const bool is_jar = items[0].kind == ItemKind::kJar;
+  if (items[0].reason.cause == &cause::kJarNotTrusted) return Verdict::kNotTrustedJar;
   if (std::none_of(items.begin(), items.end(), is_refused)) {
     return is_jar ? Verdict::kTrustedJar : Verdict::kSigned;
   }
@@ -200,12 +182,38 @@ Verdict Judge(const std::vector<Item>& items) {
   return is_partly ? Verdict::kPartlySigned : Verdict::kRefused;
 }
 
-void DescribeSigners(const PackageFacts& facts, Report* report) {
-  report->package_name = facts.manifest.package_name;
+// The key is the one that the kernel got with the package, or else with a library. Where it got
+// none, it is the one that the tool's own code reads from the file.
+void DescribeSigners(const RunRecord& run, const PackageFacts& facts, Report* report) {
+  constexpr char kDigestFollows[] = "2000";  // 32, the low byte first
+  const auto take = [report](const Attempt& attempt) {
+    if (attempt.outcome != Attempt::Outcome::kSigned || !report->payload.empty()) return;
+    report->payload = attempt.payload;
+  };
+  if (run.own) take(*run.own);
+  for (const Attempt& library : run.libraries) take(library);
+  report->package_name = facts.manifest.package_name.value_or("");
   report->signer = facts.jar.certificate;
   report->newer = facts.newer;
   if (!facts.jar.signature_files.empty()) report->schemes.push_back("v1");
   for (const std::string& scheme : NewerSchemes(facts)) report->schemes.push_back(scheme);
+  if (report->items[0].kind != ItemKind::kPackage) return;
+  if (facts.jar.key) report->key = {facts.jar.key->modulus_sha256, facts.jar.key->bits, false};
+  if (report->payload.rfind(kDigestFollows, 0) != 0) return;
+  const std::string digest = report->payload.substr(strlen(kDigestFollows));
+  const bool is_read = report->key && report->key->sha256 == digest;
+  report->key = {digest, is_read ? report->key->bits : 0, true};
+}
+
+// A doubt counts as refused for whoever is strict.
+void AddWarnings(const std::vector<Reason>& warnings, const JudgeOptions& options, Report* report) {
+  for (const Reason& warning : warnings) {
+    if (options.is_strict && warning.cause->severity == Severity::kDoubt) {
+      report->items.push_back(NotDone(ItemKind::kEntries, "entries", warning, options));
+    } else {
+      report->warnings.push_back(warning);
+    }
+  }
 }
 
 }  // namespace

@@ -1,4 +1,5 @@
-// From what happened and what can be seen to the report of it.
+// From what happened and what can be seen to the report of it: a pure function, which touches no
+// file.
 #pragma once
 
 #include "simulator/package/facts.h"
@@ -9,9 +10,13 @@ namespace simulator {
 
 // How the user wants it judged.
 struct JudgeOptions {
-  bool is_strict = false;  // a library that is not there counts as refused
+  bool is_strict = false;  // what is absent or damaged counts as refused
 };
 
 Report MakeReport(const RunRecord& run, const PackageFacts& facts, const JudgeOptions& options);
+
+// An item that is not done. The severity of its cause says in which state it is.
+Item NotDone(ItemKind kind, const std::string& name, const Reason& reason,
+             const JudgeOptions& options);
 
 }  // namespace simulator

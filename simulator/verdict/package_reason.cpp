@@ -1,30 +1,27 @@
-#include "simulator/verdict/package_reason.h"
-
+// Why a package is refused, or not looked at.
 #include <algorithm>
 #include <cerrno>
 
+#include "crypto/rsa.h"
+#include "simulator/verdict/parts.h"
 #include "simulator/verdict/wording.h"
+#include "util/text.h"
 
 namespace simulator {
 
 namespace {
 
-using Lines = std::vector<std::string>;
+using Lines = std::vector<LogLine>;
 
-constexpr char kNoMemory[] = "11";  // 17 in hexadecimal
-
-std::optional<std::string> Find(const Lines& lines, const std::string& before);
-Reason WhyDexRefused(const Lines& errors);
-Reason WhyNotOpened(const PackageFacts& facts, const std::string& error);
+Reason WhyDexRefused(LogMeaning why);
+Reason WhyNotOpened(const PackageFacts& facts, int64_t code);
 Reason WhyNoBlock(const std::string& name, const JarSignatureFacts& jar);
-Reason WhyNoKey(const std::string& code, const JarSignatureFacts& jar);
-Reason WhyCertificateRefused(const std::string& code, const JarSignatureFacts& jar);
-Reason WhySignatureRefused(const Lines& errors, const std::string& code,
-                           const JarSignatureFacts& jar);
+Reason WhyNoKey(int64_t code, const JarSignatureFacts& jar);
+Reason WhyCertificateRefused(int64_t code, const JarSignatureFacts& jar);
+Reason WhySignatureRefused(const Lines& errors, int64_t code, const JarSignatureFacts& jar);
 Reason WhyManifestRefused(const Lines& errors, const JarSignatureFacts& jar);
 Reason WhySilentlyRefused(const PackageFacts& facts);
 Reason OfOtherKey(const JarSignatureFacts& jar);
-bool IsKnownDigest(const std::string& algorithm);
 std::string FirstSignatureFile(const JarSignatureFacts& jar);
 
 }  // namespace
@@ -33,109 +30,62 @@ std::string FirstSignatureFile(const JarSignatureFacts& jar);
 Reason WhyRefused(const RunRecord& run, const PackageFacts& facts) {
   const Lines& errors = run.opening_errors;
   const JarSignatureFacts& jar = facts.jar;
-  if (run.is_dex_refused) return WhyDexRefused(run.dex_errors);
-  if (const auto error = Find(errors, "OpenArchiveFd(")) return WhyNotOpened(facts, *error);
-  if (const auto name = Find(errors, "Can't extract RSA certificate: ")) {
-    return WhyNoBlock(*name, jar);
+  if (run.is_dex_refused) return WhyDexRefused(run.dex_why);
+  for (const LogLine& line : errors) {
+    const LogMeaning meaning = line.meaning;
+    if (meaning == LogMeaning::kNoArchive) return WhyNotOpened(facts, line.number);
+    if (meaning == LogMeaning::kNoBlock) return WhyNoBlock(line.text, jar);
+    if (meaning == LogMeaning::kBlockMalformed) return OfOtherKey(jar);
+    if (meaning == LogMeaning::kKeyRefused) return WhyNoKey(line.number, jar);
+    if (meaning == LogMeaning::kCertificateRefused) return WhyCertificateRefused(line.number, jar);
+    if (meaning == LogMeaning::kSignatureRefused) {
+      return WhySignatureRefused(errors, line.number, jar);
+    }
+    if (meaning == LogMeaning::kManifestRefused) return WhyManifestRefused(errors, jar);
+    if (meaning == LogMeaning::kManifestMalformed) return {&cause::kManifestMalformed, ""};
+    if (meaning == LogMeaning::kAndroidManifestMalformed) return {&cause::kAndroidManifestText, ""};
   }
-  if (Find(errors, "Unknown certificate type")) return OfOtherKey(jar);
-  if (const auto code = Find(errors, "RSA could not set key: ")) return WhyNoKey(*code, jar);
-  if (const auto code = Find(errors, "RSA could not verify certificate: ")) {
-    return WhyCertificateRefused(*code, jar);
-  }
-  if (const auto code = Find(errors, "RSA could not verify data: ")) {
-    return WhySignatureRefused(errors, *code, jar);
-  }
-  if (Find(errors, "Can't validate manifest")) return WhyManifestRefused(errors, jar);
-  if (Find(errors, "Can't load manifest: ")) return {&cause::kManifestMalformed, ""};
-  if (Find(errors, "Can't process Android Manifest")) return {&cause::kAndroidManifestText, ""};
-  if (Find(errors, "Parse manifest: ")) {
+  if (FindError(errors, LogMeaning::kTextMalformed) != nullptr) {
     return {&cause::kSignatureFileMalformed, FirstSignatureFile(jar)};
   }
-  if (!errors.empty()) return {&cause::kToolError, errors[0]};
+  if (!errors.empty()) return {&cause::kToolError, errors[0].whole};
   return WhySilentlyRefused(facts);
 }
 
 Reason WhyNotLookedAt(const PackageFacts& facts, bool has_standard_input) {
-  switch (facts.error) {
-    case 0:
-      break;
-    case ENOENT:
-      return {&cause::kFileMissing, ""};
-    case EACCES:
-    case EPERM:
-      return {&cause::kFileNoPermission, ""};
-    default:
-      return {&cause::kFileNotOpened, DescribeErrno(facts.error)};
-  }
+  const int error = facts.error;
+  if (error == ENOENT) return {&cause::kFileMissing, ""};
+  if (error == EACCES || error == EPERM) return {&cause::kFileNoPermission, ""};
+  if (error == EWOULDBLOCK) return {&cause::kFileLeased, ""};
+  if (error != 0) return {&cause::kFileNotOpened, DescribeErrno(error)};
   if (!has_standard_input) return {&cause::kStandardInputClosed, ""};
   if (facts.is_read_only) return {&cause::kReadOnlyFileSystem, ""};
   return {};
 }
 
-// The exponent's first four bytes, whatever is missing being zero, are taken for a number with the
-// lowest byte first.
-bool IsForgeable(const PublicKey& key) {
-  if (key.algorithm != "RSA" || key.exponent.empty()) return false;
-  const std::string read = (key.exponent + std::string(4, '\0')).substr(0, 4);
-  return read == std::string("\1\0\0\0", 4) || read == "\xff\xff\xff\xff";
-}
-
-std::string ExponentText(const PublicKey& key) {
-  constexpr size_t kMost = 16;
-  if (key.exponent == "\1") return "1";
-  const bool is_long = key.exponent.size() > kMost;
-  return "0x" + HexText(key.exponent.substr(0, kMost)) + (is_long ? "..." : "") +
-         ", which is read as 1";
-}
-
 namespace {
 
-// The rest of the first line that begins so.
-std::optional<std::string> Find(const Lines& lines, const std::string& before) {
-  for (const std::string& line : lines) {
-    if (auto rest = Between(line, before, "")) return rest;
-  }
-  return {};
-}
-
-Reason WhyDexRefused(const Lines& errors) {
-  if (Find(errors, "Can't find file in ")) return {&cause::kDexNotListed, ""};
-  if (Find(errors, "verifyData: ")) return {&cause::kDexDigest, ""};
+Reason WhyDexRefused(LogMeaning why) {
+  if (why == LogMeaning::kNotListed) return {&cause::kDexNotListed, ""};
+  if (why == LogMeaning::kDigestUnknown) return {&cause::kDexDigest, ""};
   return {&cause::kDexChanged, ""};
 }
 
-Reason WhyNotOpened(const PackageFacts& facts, const std::string& error) {
-  switch (facts.kind) {
-    case FileKind::kFolder:
-      return {&cause::kFolder, ""};
-    case FileKind::kSpecial:
-      return {&cause::kSpecialFile, ""};
-    case FileKind::kEmpty:
-      return {&cause::kEmptyFile, ""};
-    case FileKind::kText:
-      return {&cause::kTextFile, ""};
-    case FileKind::kCutArchive:
-      return {&cause::kCutArchive, ""};
-    case FileKind::kNoArchive:
-      return {&cause::kNoArchive, ""};
-    case FileKind::kArchive:
-    case FileKind::kUnreadable:
-      break;
-  }
-  const bool is_without_entries = error.find("returned: -6:") != std::string::npos;
-  return {is_without_entries ? &cause::kEmptyArchive : &cause::kDamagedArchive, ""};
+Reason WhyNotOpened(const PackageFacts& facts, int64_t code) {
+  constexpr int64_t kNoEntries = -6;  // which the zip library's header does not name
+  constexpr const Cause* kCauses[] = {
+      nullptr,           &cause::kFolder,     &cause::kSpecialFile, &cause::kEmptyFile,
+      &cause::kTextFile, &cause::kCutArchive, &cause::kNoArchive,   nullptr};
+  const Cause* const why = kCauses[static_cast<size_t>(facts.kind)];
+  if (why != nullptr) return {why, ""};
+  return {code == kNoEntries ? &cause::kEmptyArchive : &cause::kDamagedArchive, ""};
 }
 
 Reason WhyNoBlock(const std::string& name, const JarSignatureFacts& jar) {
-  const auto ends_with = [&jar](const std::string& end) {
-    return jar.block_name.size() >= end.size() &&
-           jar.block_name.compare(jar.block_name.size() - end.size(), end.size(), end) == 0;
-  };
-  if (ends_with(".EC")) return {&cause::kEcKey, ""};
-  if (ends_with(".DSA")) return OfOtherKey(jar);
-  const bool is_there = jar.block_name == name;
-  return {is_there ? &cause::kSignatureBlockUnreadable : &cause::kSignatureBlockMissing, name};
+  if (!jar.has_block) return {&cause::kSignatureBlockMissing, name};
+  if (EndsWith(jar.block_name, ".EC")) return {&cause::kEcKey, ""};
+  if (EndsWith(jar.block_name, ".DSA")) return OfOtherKey(jar);
+  return {&cause::kSignatureBlockUnreadable, name};
 }
 
 // A block of a key that is not RSA's, or one that does not parse.
@@ -145,48 +95,44 @@ Reason OfOtherKey(const JarSignatureFacts& jar) {
   return {&cause::kSignatureBlockMalformed, jar.block_name};
 }
 
-Reason WhyNoKey(const std::string& code, const JarSignatureFacts& jar) {
-  if (code == "9") return {&cause::kNoMemory, ""};
-  if (jar.certificate && IsForgeable(jar.certificate->key)) {
-    return {&cause::kExponentRefused, ExponentText(jar.certificate->key)};
+Reason WhyNoKey(int64_t code, const JarSignatureFacts& jar) {
+  if (code == (kRsaKeyFlag | kMpiNoMemory)) return {&cause::kNoMemory, ""};
+  if (jar.key && jar.key->is_forgeable) {
+    return {&cause::kExponentRefused, std::to_string(jar.key->exponent)};
   }
   return {&cause::kSignatureBlockMalformed, jar.block_name};
 }
 
-Reason WhyCertificateRefused(const std::string& code, const JarSignatureFacts& jar) {
-  constexpr int kLeastBits = 128;
-  constexpr int kMostBits = 4096;
-  if (code == kNoMemory) return {&cause::kNoMemory, ""};
-  if (!jar.certificate) return {&cause::kSignatureBlockMalformed, jar.block_name};
+Reason WhyCertificateRefused(int64_t code, const JarSignatureFacts& jar) {
+  if (code == (kRsaPublicFlag | kMpiNoMemory)) return {&cause::kNoMemory, ""};
+  if (!jar.key) return {&cause::kSignatureBlockMalformed, jar.block_name};
+  const std::string bits = std::to_string(jar.key->bits);
+  if (jar.key->size > kRsaMaxModulusSize) return {&cause::kKeyTooLarge, bits};
+  if (jar.key->size < kRsaMinModulusSize) return {&cause::kKeyTooSmall, bits};
+  if (!jar.certificate) return {&cause::kCertificateChanged, ""};
   const CertificateFacts& certificate = *jar.certificate;
-  const int bits = certificate.key.bits;
-  if (bits > kMostBits) return {&cause::kKeyTooLarge, std::to_string(bits)};
-  if (bits < kLeastBits) return {&cause::kKeyTooSmall, std::to_string(bits)};
   if (!certificate.is_self_issued) return {&cause::kCertificateIssued, certificate.issuer};
-  if (!IsKnownDigest(certificate.signature_algorithm)) {
+  if (!certificate.has_known_digest) {
     return {&cause::kCertificateDigest, certificate.signature_algorithm};
   }
   return {&cause::kCertificateChanged, ""};
 }
 
-Reason WhySignatureRefused(const Lines& errors, const std::string& code,
-                           const JarSignatureFacts& jar) {
-  if (code == kNoMemory) return {&cause::kNoMemory, ""};
-  if (jar.has_signed_attributes) return {&cause::kSignedAttributes, ""};
-  const bool is_pss = jar.signature_algorithm == "RSASSA-PSS";
-  if (is_pss || (jar.block_is_whole && !IsKnownDigest(jar.digest))) {
-    return {&cause::kSignatureDigest, is_pss ? jar.signature_algorithm : jar.digest};
+Reason WhySignatureRefused(const Lines& errors, int64_t code, const JarSignatureFacts& jar) {
+  if (code == (kRsaPublicFlag | kMpiNoMemory)) return {&cause::kNoMemory, ""};
+  if (jar.block.has_signed_attributes) return {&cause::kSignedAttributes, ""};
+  if (jar.block.has_pss) return {&cause::kSignatureDigest, "RSASSA-PSS"};
+  if (jar.block.is_whole && !jar.block.has_known_digest)
+    return {&cause::kSignatureDigest, jar.block.digest};
+  if (FindError(errors, LogMeaning::kOtherDigest) != nullptr) {
+    return {&cause::kSignatureFileChanged, FirstSignatureFile(jar)};
   }
-  const bool is_of_other_data = std::any_of(errors.begin(), errors.end(), [](const auto& line) {
-    return line.find("hash does not match") != std::string::npos ||
-           line == "SHA hash check unsuccessfull";
-  });
-  if (is_of_other_data) return {&cause::kSignatureFileChanged, FirstSignatureFile(jar)};
   return {&cause::kSignatureWrong, jar.block_name};
 }
 
 Reason WhyManifestRefused(const Lines& errors, const JarSignatureFacts& jar) {
-  const bool has_none = Find(errors, "verifyData: ").has_value() || !jar.has_manifest_digest;
+  const bool has_none =
+      FindError(errors, LogMeaning::kDigestUnknown) != nullptr || !jar.has_manifest_digest;
   return {has_none ? &cause::kManifestDigest : &cause::kManifestChanged, ""};
 }
 
@@ -194,21 +140,17 @@ Reason WhyManifestRefused(const Lines& errors, const JarSignatureFacts& jar) {
 Reason WhySilentlyRefused(const PackageFacts& facts) {
   const JarSignatureFacts& jar = facts.jar;
   if (facts.archive_result != 0) return {&cause::kDamagedArchive, ""};
-  if (!jar.has_manifest) {
+  if (jar.manifest == Archive::ReadResult::kMissing) {
     if (facts.newer.empty()) return {&cause::kUnsigned, ""};
     return {&cause::kNewerSchemeOnly, Joined(NewerSchemes(facts))};
   }
-  if (!jar.can_read_manifest) return {&cause::kManifestUnreadable, ""};
+  if (jar.manifest == Archive::ReadResult::kDamaged) return {&cause::kManifestUnreadable, ""};
+  for (const ListedEntry& each : facts.entries) {
+    if (!each.entry.is_damaged || !kSignatureFileNames.Has(each.entry.name)) continue;
+    return {&cause::kSignatureFileUnreadable, each.entry.name};
+  }
   if (jar.signature_files.empty()) return {&cause::kSignatureFileMissing, ""};
   return {&cause::kSignatureFileUnreadable, FirstSignatureFile(jar)};
-}
-
-// MD5, SHA-1 or SHA-256, by themselves or with RSA.
-bool IsKnownDigest(const std::string& algorithm) {
-  constexpr const char* kKnown[] = {"MD5",        "SHA-1",       "SHA-256",
-                                    "MD5withRSA", "SHA1withRSA", "SHA256withRSA"};
-  return std::any_of(std::begin(kKnown), std::end(kKnown),
-                     [&algorithm](const char* known) { return algorithm == known; });
 }
 
 std::string FirstSignatureFile(const JarSignatureFacts& jar) {

@@ -1,6 +1,5 @@
 // What came of one file: the one structure from which the text, the journal's last event and any
-// other form of it are made. Plain data, computed once by MakeReport (make_report.h) from what the
-// journal tells and from what can be seen in the file.
+// other form of it are made. Plain data, computed once by MakeReport (make_report.h).
 #pragma once
 
 #include <cstdint>
@@ -11,27 +10,25 @@
 #include "simulator/package/facts.h"
 #include "simulator/run/events.h"
 #include "simulator/verdict/causes.h"
+#include "simulator/verdict/exit_status.h"
 
 namespace simulator {
 
 enum class Verdict {
   kSigned,
+  kTrustedJar,
   kPartlySigned,
   kRefused,
-  kTrustedJar,
   kNotTrustedJar,
   kNotLookedAt,
   kNotSimulated,
 };
 
-enum class ItemKind { kPackage, kJar, kFile, kLibrary, kKey, kTool };
+enum class ItemKind { kPackage, kJar, kFile, kEntries, kLibrary, kKey, kTool };
 
-enum class ItemState {
-  kDone,     // signed, or registered
-  kRefused,  // should have been, and was not
-  kAbsent,   // a library that does not lie beside the package; refused where the user is strict
-  kNothing,  // nothing to sign
-};
+// Signed or registered; should have been and was not; a library that does not lie beside the
+// package, which is refused where the user is strict; nothing to sign.
+enum class ItemState { kDone, kRefused, kAbsent, kNothing };
 
 // A cause with what fills in its "%s".
 struct Reason {
@@ -44,10 +41,18 @@ struct Reason {
 // One thing that was to be signed or registered.
 struct Item {
   ItemKind kind;
-  std::string name;   // of a library: below the package's folder; of a key: what it is for
+  std::string name;   // of a library: below the package's directory; of a key: what it is for
   std::string entry;  // of a library: in the package
   ItemState state;
-  Reason reason;  // none for what is done
+  Reason reason;             // none for what is done
+  bool is_verified = false;  // its bytes were compared with the manifest, and are the same
+};
+
+// The key that the JAR signature is made with, as kernel and tool know it.
+struct KernelKey {
+  std::string sha256;    // of its modulus; in hexadecimal
+  int bits = 0;          // 0: not known
+  bool was_got = false;  // the kernel got this digest; else it is what the tool would hand to it
 };
 
 // A part of the package, by what protects it.
@@ -66,7 +71,7 @@ struct Protection {
 
 enum class LinkState { kHolds, kBroken, kNotReached };
 
-// One link of the chain from the key to the entries, each of which vouches for the next.
+// One link of the chain from the key to the entries.
 struct Link {
   const char* name;
   LinkState state;
@@ -77,10 +82,12 @@ struct Report {
   std::string file;  // as given
   std::string path;  // absolute, without symbolic links
   Verdict verdict = Verdict::kNotSimulated;
-  std::string package_name;
+  std::string package_name;  // as the tool reads it
   std::vector<Item> items;
   std::vector<Reason> warnings;
 
+  std::string payload;                     // that the kernel got, in hexadecimal; empty: none
+  std::optional<KernelKey> key;            // of a package with an RSA key
   std::optional<CertificateFacts> signer;  // of the JAR signature
   std::vector<std::string> schemes;        // that the file carries: "v1", "v2", …
   std::vector<NewerSignerFacts> newer;     // who signed with those after v1
@@ -92,6 +99,6 @@ struct Report {
 };
 
 // The exit status that a verdict stands for.
-int StatusOf(Verdict verdict);
+ExitStatus StatusOf(Verdict verdict);
 
 }  // namespace simulator

@@ -1,93 +1,126 @@
-#include "simulator/verdict/warnings.h"
-
+// What is worth a second look.
 #include <algorithm>
 
-#include "simulator/verdict/package_reason.h"
+#include "simulator/verdict/parts.h"
 #include "simulator/verdict/wording.h"
 
 namespace simulator {
 
 namespace {
 
-void WarnOfOtherKeys(const PackageFacts& facts, std::vector<Reason>* warnings);
-void WarnOfStrippedSchemes(const PackageFacts& facts, std::vector<Reason>* warnings);
-void WarnOfUnlistedEntries(const PackageFacts& facts, std::vector<Reason>* warnings);
+using Reasons = std::vector<Reason>;
+
+void WarnOfTwoFaces(const PackageFacts& facts, const Report& report, Reasons* warnings);
+void WarnOfSigners(const PackageFacts& facts, const Report& report, Reasons* warnings);
+void WarnOfOtherKeys(const PackageFacts& facts, const Report& report, Reasons* warnings);
+bool IsJarSigner(const PublicKey& key, const Report& report);
+void WarnOfStrippedSchemes(const PackageFacts& facts, Reasons* warnings);
+void WarnOfEntries(const PackageFacts& facts, Reasons* warnings);
 
 }  // namespace
 
-std::vector<Reason> FindWarnings(const PackageFacts& facts, const Item& own,
-                                 const std::vector<std::string>& not_laid_out) {
-  std::vector<Reason> warnings;
-  const JarSignatureFacts& jar = facts.jar;
-  if (own.kind == ItemKind::kPackage && jar.certificate) {
-    const bool is_said = own.reason.cause == &cause::kExponentRefused;
-    if (!is_said && IsForgeable(jar.certificate->key)) {
-      warnings.push_back({&cause::kForgeableKey, ExponentText(jar.certificate->key)});
-    }
-    if (jar.signature_files.size() > 1 || jar.signer_count > 1) {
-      warnings.push_back({&cause::kSeveralSigners, jar.signature_files[0]});
-    }
-    WarnOfOtherKeys(facts, &warnings);
+std::vector<Reason> FindWarnings(const RunRecord& run, const PackageFacts& facts,
+                                 const Report& report) {
+  Reasons warnings;
+  const bool is_package = report.items[0].kind == ItemKind::kPackage;
+  if (facts.was_changed) warnings.push_back({&cause::kFileChanged, ""});
+  if (is_package) {
+    WarnOfTwoFaces(facts, report, &warnings);
+    WarnOfSigners(facts, report, &warnings);
+    WarnOfOtherKeys(facts, report, &warnings);
     WarnOfStrippedSchemes(facts, &warnings);
   }
   if (facts.has_damaged_signing_block) warnings.push_back({&cause::kSigningBlockDamaged, ""});
-  if (own.kind == ItemKind::kPackage && jar.has_manifest) {
-    WarnOfUnlistedEntries(facts, &warnings);
+  for (const std::string& what : facts.too_long) {
+    warnings.push_back({&cause::kNotLookedInto, what});
   }
-  if (!not_laid_out.empty()) {
-    warnings.push_back({&cause::kNotLaidOut, Counted(not_laid_out.size(), "entry", "entries") +
-                                                 ": " + not_laid_out[0] +
-                                                 (not_laid_out.size() > 1 ? ", ..." : "")});
+  if (is_package) WarnOfEntries(facts, &warnings);
+  if (!run.not_laid_out.empty()) {
+    warnings.push_back({&cause::kNotLaidOut, CountedNames(run.not_laid_out)});
   }
   return warnings;
 }
 
 namespace {
 
-// One warning for a scheme that the JAR signer has no part in.
-void WarnOfOtherKeys(const PackageFacts& facts, std::vector<Reason>* warnings) {
-  const std::string& key = facts.jar.certificate->key.sha256;
-  for (const std::string& scheme : NewerSchemes(facts)) {
-    std::vector<CertificateFacts> signers;
-    for (const NewerSignerFacts& signer : facts.newer) {
-      if (signer.scheme == scheme) signers.push_back(signer.certificate);
-    }
-    const bool has_key = std::any_of(signers.begin(), signers.end(), [&key](const auto& signer) {
-      return signer.key.sha256 == key;
-    });
-    if (has_key || signers.empty()) continue;
-    warnings->push_back(
-        {&cause::kOtherKey, "the " + scheme + " signature (" + signers[0].subject +
-                                ", public key SHA-256 digest: " + signers[0].key.sha256 + ")"});
+// What others read of the package is not what the tool reads.
+void WarnOfTwoFaces(const PackageFacts& facts, const Report& report, Reasons* warnings) {
+  const JarSignatureFacts& jar = facts.jar;
+  if (report.key && jar.certificate) {
+    const std::string& shown = jar.certificate->key.modulus_sha256;
+    const std::string detail =
+        shown.empty() ? "none that others read" : "modulus SHA-256 digest: " + shown;
+    if (shown != report.key->sha256) warnings->push_back({&cause::kCertificateOtherKey, detail});
   }
+  if (jar.key && (!jar.certificate || !jar.block.is_whole)) {
+    warnings->push_back({&cause::kBlockAmbiguous, "it is not encoded strictly"});
+  } else if (jar.names_other_certificate) {
+    warnings->push_back({&cause::kBlockAmbiguous, "it names another certificate than its first"});
+  }
+  const AndroidManifest& manifest = facts.manifest;
+  if (manifest.package_name && *manifest.package_name != manifest.installer_name) {
+    warnings->push_back({&cause::kOtherPackageName, "\"" + manifest.installer_name + "\""});
+  }
+}
+
+void WarnOfSigners(const PackageFacts& facts, const Report& report, Reasons* warnings) {
+  const JarSignatureFacts& jar = facts.jar;
+  const bool is_said = report.items[0].reason.cause == &cause::kExponentRefused;
+  if (!is_said && jar.key && jar.key->is_forgeable) {
+    warnings->push_back({&cause::kForgeableKey, std::to_string(jar.key->exponent)});
+  }
+  if (jar.signature_files.size() > 1 || jar.block.signer_count > 1) {
+    warnings->push_back({&cause::kSeveralSigners, jar.signature_files[0]});
+  }
+}
+
+// One warning for a scheme that has another signer than the JAR signature.
+void WarnOfOtherKeys(const PackageFacts& facts, const Report& report, Reasons* warnings) {
+  if (!report.key && !report.signer) return;
+  for (const std::string& scheme : NewerSchemes(facts)) {
+    const auto other =
+        std::find_if(facts.newer.begin(), facts.newer.end(), [&](const NewerSignerFacts& signer) {
+          return signer.scheme == scheme && !IsJarSigner(signer.certificate.key, report);
+        });
+    if (other == facts.newer.end()) continue;
+    warnings->push_back(
+        {&cause::kOtherKey, "the " + scheme + " signature (" + other->certificate.subject +
+                                ", public key SHA-256 digest: " + other->certificate.key.sha256 +
+                                ")"});
+  }
+}
+
+bool IsJarSigner(const PublicKey& key, const Report& report) {
+  if (report.key && key.modulus_sha256 != report.key->sha256) return false;
+  return !report.signer || key.sha256 == report.signer->key.sha256;
 }
 
 // The signature file names the schemes by their numbers: "2, 3".
-void WarnOfStrippedSchemes(const PackageFacts& facts, std::vector<Reason>* warnings) {
-  std::string missing;
-  for (const char number : facts.jar.claimed_schemes) {
-    if (number != '2' && number != '3') continue;
-    const std::string scheme = std::string("v") + number;
-    bool is_there = false;
-    for (const std::string& present : NewerSchemes(facts)) {
-      is_there = is_there || present == scheme;
-    }
-    const bool is_new = missing.find(scheme) == std::string::npos;
-    if (!is_there && is_new) missing += (missing.empty() ? "" : ", ") + scheme;
+void WarnOfStrippedSchemes(const PackageFacts& facts, Reasons* warnings) {
+  const std::vector<std::string> present = NewerSchemes(facts);
+  std::vector<std::string> missing;
+  for (const std::string scheme : {"v2", "v3"}) {
+    const bool is_claimed = facts.jar.claimed_schemes.find(scheme[1]) != std::string::npos;
+    const bool is_there = std::find(present.begin(), present.end(), scheme) != present.end();
+    if (is_claimed && !is_there) missing.push_back(scheme);
   }
-  if (!missing.empty()) warnings->push_back({&cause::kSchemesStripped, missing});
+  if (!missing.empty()) warnings->push_back({&cause::kSchemesStripped, Joined(missing)});
 }
 
-void WarnOfUnlistedEntries(const PackageFacts& facts, std::vector<Reason>* warnings) {
-  size_t count = 0;
+void WarnOfEntries(const PackageFacts& facts, Reasons* warnings) {
+  const bool has_list = facts.jar.manifest == Archive::ReadResult::kRead;
+  uint64_t unlisted = 0;
   uint64_t bytes = 0;
-  for (const ListedEntry& entry : facts.entries) {
-    if (entry.is_listed || entry.is_signature) continue;
-    ++count;
-    bytes += entry.entry.size;
+  std::vector<std::string> damaged;
+  for (const ListedEntry& each : facts.entries) {
+    if (each.entry.is_damaged) damaged.push_back(each.entry.name);
+    if (!has_list || each.is_listed || each.is_signature) continue;
+    ++unlisted;
+    bytes += each.entry.size;
   }
-  if (count == 0) return;
-  warnings->push_back({&cause::kUnlistedEntries, Counted(count, "entry", "entries") + " (" +
+  if (!damaged.empty()) warnings->push_back({&cause::kEntriesDamaged, CountedNames(damaged)});
+  if (unlisted == 0) return;
+  warnings->push_back({&cause::kUnlistedEntries, Counted(unlisted, "entry", "entries") + " (" +
                                                      Counted(bytes, "byte", "bytes") + ")"});
 }
 

@@ -1,9 +1,11 @@
-// Numbers and lists as they stand in sentences.
+// Numbers, lists and keys as they stand in sentences.
 #pragma once
 
 #include <cstdint>
 #include <string>
 #include <vector>
+
+#include "simulator/verdict/report.h"
 
 namespace simulator {
 
@@ -17,6 +19,21 @@ inline std::string Joined(const std::vector<std::string>& words) {
   std::string text;
   for (const std::string& word : words) text += (text.empty() ? "" : ", ") + word;
   return text;
+}
+
+// The number of the names with their noun, and the first of them: "3 entries: a, ...".
+inline std::string CountedNames(const std::vector<std::string>& names) {
+  return Counted(names.size(), "entry", "entries") + ": " + names[0] +
+         (names.size() > 1 ? ", ..." : "");
+}
+
+// Such as "RSA-2048", of the JAR signer: as the tool reads the key, else as the certificate shows
+// it. Empty when nobody does.
+inline std::string KeyName(const Report& report) {
+  const PublicKey shown = report.signer ? report.signer->key : PublicKey();
+  const std::string algorithm = report.key ? "RSA" : shown.algorithm;
+  const int bits = report.key ? report.key->bits : shown.bits;
+  return bits == 0 ? algorithm : algorithm + "-" + std::to_string(bits);
 }
 
 }  // namespace simulator

@@ -160,13 +160,13 @@ Installed PackageWithAnotherLibrary() {
 TEST(FaultsOfCalls, CostAGoodPackageWhatTheyAreFor) {
   Installed file = GoodPackage();
   ExpectRuns(file, "LPK",
-             {{"open", {"", "PK", "PK"}},   // the package; the library to read it, to sign it
-              {"read", {"PK"}},             // the library
-              {"fopen", {"PK", "LK"}},      // the own integrity value, before each signing
-              {"fcntl", {"PK", "LK"}},      // the signings
-              {"readlink", {"PK", "LPK"}},  // the libraries' folder; a message
-              {"fstatvfs", {"LPK"}},        // a file system that counts as writable
-              {"fgetxattr", {}}});          // JARs alone have attributes
+             {{"open", {"", "PK", "PK"}},     // the package; the library to read it, to sign it
+              {"read", {"PK"}},               // the library
+              {"fopen", {"PK", "LK"}},        // the own integrity value, before each signing
+              {"fcntl", {"PK", "PK", "LK"}},  // the library kept open; the signings
+              {"readlink", {"PK", "LPK"}},    // the libraries' folder; a message
+              {"fstatvfs", {"LPK"}},          // a file system that counts as writable
+              {"fgetxattr", {}}});            // JARs alone have attributes
 }
 
 TEST(FaultsOfCalls, CostATrustedJarWhatTheyAreFor) {
@@ -199,7 +199,7 @@ TEST(FaultsOfCalls, GetNoLibrarySignedThatIsNotTheManifests) {
              {{"open", {"", "P"}},
               {"read", {"P"}},
               {"fopen", {""}},
-              {"fcntl", {""}},
+              {"fcntl", {"P", ""}},
               {"readlink", {"P"}},
               {"fstatvfs", {"P"}},
               {"fgetxattr", {}}});

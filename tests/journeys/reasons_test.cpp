@@ -133,7 +133,7 @@ TEST_F(Reason, CertificateSignedWithALongerDigest) {
 TEST_F(Reason, SignatureOverALongerDigest) {
   Take("openssl-cms-sha512");
   EXPECT_EQ(Told(2)[1],
-            "  ✗ package                not signed: it is signed over SHA-512, and this tool reads "
+            "  ✗ package                not signed: it is signed over SHA512, and this tool reads "
             "MD5, SHA-1 and SHA-256");
 }
 
@@ -153,8 +153,8 @@ TEST_F(Reason, ExponentOfOne) {
             "which anyone can make its signatures");
   EXPECT_EQ(told[2], "      Do not trust this package. A key of one's own has the exponent 65537.");
   EXPECT_EQ(refusal({0xff, 0xff, 0xff, 0xff})[1],
-            "  ✗ package                not signed: its RSA key has the public exponent "
-            "0xffffffff, which is read as 1, with which anyone can make its signatures");
+            "  ✗ package                not signed: its RSA key has the public exponent -1, "
+            "with which anyone can make its signatures");
 }
 
 TEST_F(Reason, Folder) {

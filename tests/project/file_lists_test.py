@@ -24,8 +24,10 @@ WORKSTATION_ONLY = {
     "fuzz/compiled_manifest_fuzz.cpp": "replaces the program's operator new",
     "fuzz/explanation_fuzz.cpp": "reads with the simulator",
     "fuzz/integrity_fuzz.cpp": "has the linker wrap calls of the C library",
+    "fuzz/journal_fuzz.cpp": "reads with the simulator",
     "fuzz/mpi_fuzz.cpp": "compares with GMP",
     "fuzz/package_fuzz.cpp": "has the linker wrap a call of the zip library",
+    "fuzz/verdict_fuzz.cpp": "judges with the simulator",
 }
 
 # The words that the build of Android 8.1 knows. An unknown one stops the whole tree.

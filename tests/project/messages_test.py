@@ -1,13 +1,14 @@
 #!/usr/bin/env python3
 """Holds docs/messages.md against the sources, both ways.
 
-The tool's messages: text, priority and file. The simulator's reasons: code, text and cure, which
-stand in docs/journal.schema.json, too, as far as codes go; and the messages that a reason is known by.
+The tool's messages: text, priority and file. Of the simulator, the texts that it understands in the
+tool's log, and the rows of its causes, from which the tables of reasons on the page and the codes in
+docs/journal.schema.json are made: with --write both are brought up to date instead.
 """
 
-import json
 import re
 import sys
+import textwrap
 
 from sources import ROOT, report, tool_sources, without_comments
 
@@ -52,36 +53,109 @@ def documented():
             for entry in entries for path in re.findall(r"`([^`]+)`", entry["files"])}
 
 
-# A row of the table of reasons in the sources, and on the page.
-CAUSE = re.compile(r"inline constexpr Cause k\w+ = \{\s*(%s),\s*(%s),\s*(%s)\}" % ((LITERALS,) * 3))
-ROW = re.compile(r"^\| `(?P<code>[a-z0-9-]+)` \| (?P<reason>.+?) \| (?P<cure>.+?) \| (?P<log>.*?) \|$",
-                 re.M)
+# A row of the simulator's table of causes.
+CAUSES = ROOT / "simulator/verdict/causes.h"
+CAUSE = re.compile(r"inline constexpr Cause (?P<name>k\w+) = \{\s*(?P<code>%s),\s*Group::(?P<group>k\w+),"
+                   r"\s*Severity::(?P<severity>k\w+),\s*ChainLink::(?P<link>k\w+),\s*(?P<log>%s),"
+                   r"\s*(?P<reason>%s),\s*(?P<cure>%s)\};" % ((LITERALS,) * 4))
+
+# The groups in their order, with what stands above their tables.
+GROUPS = {"kNotLookedAt": "The tool did not look at the file",
+          "kSimulation": "The simulation could not tell", "kFile": "What the file is",
+          "kSignature": "A package's signature", "kKernel": "The kernel", "kLibrary": "A library",
+          "kKey": "The key", "kTool": "The tool itself", "kWarning": "Warnings"}
+
+# Causes that leave the chain from the key to the entries whole: all others have to break it.
+UNBROKEN = {"kKernel", "kKey", "kWarning"}
+
+PAGE = ROOT / "docs/messages.md"
+REASONS = re.compile(r"(?<=\n)%s:\n.*" % GROUPS["kNotLookedAt"], re.S)
+SCHEMA = ROOT / "docs/journal.schema.json"
+CODES = re.compile(r'("reason": \{\n\s*"enum": )\[.*?\]', re.S)
 
 
-def reasons_problems(messages):
-    """What differs between simulator/verdict/causes.h, the page's tables and the schema."""
-    header = (ROOT / "simulator/verdict/causes.h").read_text()
-    causes = [tuple(joined(part).replace('\\"', '"') for part in row) for row in CAUSE.findall(header)]
-    page = (ROOT / "docs/messages.md").read_text()
-    rows = [(row["code"], row["reason"], row["cure"]) for row in ROW.finditer(page)]
-    schema = json.loads((ROOT / "docs/journal.schema.json").read_text())
-    problems = [f"the page lacks or differs in {cause}" for cause in causes if cause not in rows]
-    problems += [f"not in the sources: {row}" for row in rows if row not in causes]
-    if len(causes) != header.count("Cause k") or len({code for code, *_ in causes}) != len(causes):
-        problems.append("simulator/verdict/causes.h: a row does not read, or has another's code")
-    if schema["$defs"]["reason"]["enum"] != [code for code, *_ in causes]:
-        problems.append("the codes of docs/journal.schema.json are not those of the sources")
-    for row in ROW.finditer(page):
-        problems += [f"{row['code']}: no message {text}" for text in re.findall(r"`([^`]+)`", row["log"])
+def causes():
+    header = CAUSES.read_text()
+    rows = [{field: joined(text).replace('\\"', '"') if text.startswith('"') else text
+             for field, text in row.groupdict().items()} for row in CAUSE.finditer(header)]
+    if len(rows) != header.count("Cause k"):
+        sys.exit(f"{CAUSES}: a row does not read")
+    return rows
+
+
+def tables(rows):
+    """The tables of reasons as the page has them."""
+    parts = []
+    for group, title in GROUPS.items():
+        lines = [f"| `{row['code']}` | {row['reason']} | {row['cure']} | {row['log']} |"
+                 for row in rows if row["group"] == group]
+        parts.append("\n".join([f"{title}:", "", "| Code | Reason | What to do | In the log |",
+                                "|---|---|---|---|", *lines, ""]))
+    return "\n".join(parts)
+
+
+def codes(rows):
+    """The list of codes as the schema has it."""
+    text = ", ".join(f'"{row["code"]}"' for row in rows)
+    return "[\n" + textwrap.fill(text, 100, initial_indent=" " * 8, subsequent_indent=" " * 8,
+                                 break_on_hyphens=False) + "\n      ]"
+
+
+def reasons_problems(rows, messages):
+    problems = []
+    if len({row["code"] for row in rows}) != len(rows):
+        problems.append("a code stands twice")
+    chosen = "".join(path.read_text() for path in (ROOT / "simulator").rglob("*.cpp"))
+    for row in rows:
+        name = row["name"]
+        if row["group"] not in GROUPS:
+            problems.append(f"{name}: the group has no title")
+        if f"&cause::{name}" not in chosen:
+            problems.append(f"{name} is chosen nowhere")
+        is_absent = row["severity"] in ("kAbsent", "kNothing", "kFollows")
+        may_hold = row["group"] in UNBROKEN or row["group"] == "kLibrary" or is_absent
+        if row["link"] == "kNone" and not may_hold and row["group"] != "kTool":
+            problems.append(f"{name} breaks no link of the chain")
+        problems += [f"{name}: no message {text}" for text in re.findall(r"`([^`]+)`", row["log"])
                      if not any(text in message for message in messages)]
     return problems
 
 
+# A row of the texts that the simulator understands: meaning, text, what is captured.
+LOG_LINES = ROOT / "simulator/run/log_lines.cpp"
+LOG_TEXT = re.compile(r"\{LogMeaning::k\w+,\s*(%s),\s*(\d+|kNothing)\}" % LITERALS)
+
+
+def log_problems(messages):
+    source = LOG_LINES.read_text()
+    rows = LOG_TEXT.findall(source)
+    problems = [f"the tool does not log {text}" for text in (joined(text) for text, _ in rows)
+                if text not in messages]
+    if len(rows) != source.count("{LogMeaning::"):
+        problems.append(f"{LOG_LINES}: a row does not read")
+    for text, captured in rows:
+        if captured != "kNothing" and int(captured) >= len(re.findall("%", text)):
+            problems.append(f"there is nothing to capture in {joined(text)}")
+    return problems
+
+
 def main():
+    rows = causes()
+    page, schema = PAGE.read_text(), SCHEMA.read_text()
+    right_page = REASONS.sub(lambda _: tables(rows), page)
+    right_schema = CODES.sub(lambda match: match[1] + codes(rows), schema)
+    if sys.argv[1:] == ["--write"]:
+        PAGE.write_text(right_page)
+        SCHEMA.write_text(right_schema)
+        return 0
     in_sources, in_page = written(), documented()
+    messages = {text for text, _, _ in in_sources}
     problems = [f"not in docs/messages.md: {entry}" for entry in sorted(in_sources - in_page)]
     problems += [f"not in the sources: {entry}" for entry in sorted(in_page - in_sources)]
-    problems += reasons_problems({text for text, _, _ in in_page})
+    problems += log_problems(messages) + reasons_problems(rows, messages)
+    problems += [f"{path} is not as tests/project/messages_test.py --write makes it"
+                 for path, is_right in ((PAGE, page == right_page), (SCHEMA, schema == right_schema))
+                 if not is_right]
     return report(problems)
 
 

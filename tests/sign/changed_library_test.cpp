@@ -90,7 +90,7 @@ class ChangedLibrary : public testing::Test {
   int DescriptorsOfLibrary() const {
     const struct stat library = State();
     int count = 0;
-    for (int fd = 0; fd < 100; ++fd) {
+    for (int fd = 0; fd < 200; ++fd) {
       struct stat state;
       count += fstat(fd, &state) == 0 && state.st_dev == library.st_dev &&
                state.st_ino == library.st_ino;

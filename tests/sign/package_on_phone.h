@@ -33,10 +33,6 @@ inline std::string SignEvent(int fd) {
   return "sign " + std::to_string(fd) + " " + PackagePayload();
 }
 
-// The descriptor that a library is signed on, for a package that has the last one. The file that
-// was digested is open on the one between.
-inline int LibraryDescriptor(int package) { return package + 2; }
-
 inline ZipItem Library(const std::string& name) { return {name, ToBytes("\177ELF " + name)}; }
 
 inline LogRecord Starts(int fd) {

@@ -7,7 +7,6 @@
 #include <unistd.h>
 
 #include <cerrno>
-#include <optional>
 
 #include "sign/integrity.h"
 #include "sign/package_on_phone.h"
@@ -145,18 +144,17 @@ TEST(VeltSignJni, ALibraryIsSignedOnItsOwnDescriptorWithThePayloadOfThePackage) 
   file.Install("lib/arm64/libfoo.so", library);
   EXPECT_EQ(file.SignJni(), 0U);
   // The library's descriptor is the lowest free one, the one after the package's.
-  EXPECT_EQ(file.phone.events, Events({kSelf, SignEvent(LibraryDescriptor(file.fd()))}));
+  EXPECT_EQ(file.phone.events, Events({kSelf, SignEvent(file.fd() + 1)}));
   EXPECT_EQ(file.log.records(),
             Records({Starts(file.fd()), Info("VeltSignOat: Apk case.\n"), Finished()}));
 }
 
-TEST(VeltSignJni, TheDescriptorsOfALibraryAreClosed) {
+TEST(VeltSignJni, TheDescriptorOfALibraryIsClosed) {
   const ZipItem library = Library("lib/arm64-v8a/libfoo.so");
   PackageOnPhone file(MakePackage(WithLibraries({library})));
   file.Install("lib/arm64/libfoo.so", library);
   file.SignJni();
   EXPECT_EQ(fcntl(file.fd() + 1, F_GETFD), -1);
-  EXPECT_EQ(fcntl(LibraryDescriptor(file.fd()), F_GETFD), -1);
 }
 
 // As in a process that was started without standard input.
@@ -164,18 +162,12 @@ TEST(VeltSignJni, ALibraryMayHaveDescriptor0) {
   const ZipItem library = Library("lib/arm64-v8a/libfoo.so");
   PackageOnPhone file(MakePackage(WithLibraries({library})));
   file.Install("lib/arm64/libfoo.so", library);
-  for (const int opening : {1, 2}) {  // to digest it, and to sign it
-    std::optional<FreeDescriptor> zero;
-    int openings = 0;
-    file.phone.before_open = [&](const char*, int) {
-      if (++openings == opening) zero.emplace(0);
-    };
+  {
+    const FreeDescriptor zero(0);
     EXPECT_EQ(file.SignJni(), 0U);
     EXPECT_EQ(fcntl(0, F_GETFD), -1);
   }
-  // What had descriptor 0 is kept on another one meanwhile.
-  EXPECT_EQ(file.phone.events,
-            Events({kSelf, SignEvent(LibraryDescriptor(file.fd())), kSelf, SignEvent(0)}));
+  EXPECT_EQ(file.phone.events, Events({kSelf, SignEvent(0)}));
 }
 
 TEST(VeltSignJni, ALibraryIsOpenedWithoutWaiting) {
@@ -228,7 +220,7 @@ TEST(VeltSignJni, ALibraryOfAnotherAbiEndsNothingWhicheverIsWalkedFirst) {
     file.Install("lib/arm64/libfoo.so", library);
     ++(FirstOf(file.apk()) == other.name ? first : last);
     EXPECT_EQ(file.SignJni(), 0U);
-    EXPECT_EQ(file.phone.events, Events({kSelf, SignEvent(LibraryDescriptor(file.fd()))}));
+    EXPECT_EQ(file.phone.events, Events({kSelf, SignEvent(file.fd() + 1)}));
     EXPECT_EQ(file.log.records(),
               Records({Starts(file.fd()), Info("VeltSignOat: Apk case.\n"), Finished()}));
   }
@@ -242,7 +234,7 @@ bool IsFoundAt(const std::string& entry, const std::string& installed) {
   PackageOnPhone file(MakePackage(WithLibraries({library})));
   file.Install(installed, library);
   file.SignJni();
-  return file.phone.events == Events({kSelf, SignEvent(LibraryDescriptor(file.fd()))});
+  return file.phone.events == Events({kSelf, SignEvent(file.fd() + 1)});
 }
 
 TEST(VeltSignJni, EveryRowOfTheDirectoryTableIsFoundInItsDirectoryAndNowhereElse) {
@@ -270,7 +262,7 @@ TEST(VeltSignJni, TwoAbisOfOneDirectoryAreBothSigned) {
   file.Install("lib/arm/libfoo.so", first);
   file.Install("lib/arm/libbar.so", second);
   file.SignJni();
-  const std::string event = SignEvent(LibraryDescriptor(file.fd()));
+  const std::string event = SignEvent(file.fd() + 1);
   EXPECT_EQ(file.phone.events, Events({kSelf, event, kSelf, event}));
 }
 
@@ -286,7 +278,7 @@ TEST(VeltSignJni, APackagePathWithoutASlashLooksInTheWorkingDirectory) {
   apk.Init(archive.fd(), "base.apk");
   log.Clear();
   EXPECT_EQ(VeltSignJni(apk, archive.fd(), "base.apk"), 0U);
-  EXPECT_EQ(phone.events, Events({kSelf, SignEvent(LibraryDescriptor(archive.fd()))}));
+  EXPECT_EQ(phone.events, Events({kSelf, SignEvent(archive.fd() + 1)}));
   ASSERT_EQ(chdir("/"), 0);
   EXPECT_EQ(VeltSignJni(apk, archive.fd(), "base.apk"), 0U);
   EXPECT_EQ(log.records()[log.records().size() - 2],
@@ -310,7 +302,7 @@ TEST(VeltSignJni, ALibraryWhoseBytesDifferIsNotSignedAndTheOthersAre) {
   file.Install("lib/arm64/liba.so", good);
   file.Install("lib/arm64/libb.so", {"", ToBytes("\177ELF other bytes")});
   EXPECT_EQ(file.SignJni(), 0U);
-  EXPECT_EQ(file.phone.events, Events({kSelf, SignEvent(LibraryDescriptor(file.fd()))}));
+  EXPECT_EQ(file.phone.events, Events({kSelf, SignEvent(file.fd() + 1)}));
   // The order of the two is the zip library's.
   const LogRecord refused =
       Error("VeltSignJni: File not verified: " + file.Path("lib/arm64/libb.so") + "\n");

@@ -4,6 +4,7 @@
 #include <unistd.h>
 
 #include "simulator/simulated.h"
+#include "support/package.h"
 
 TEST(ExitStatus, ZeroWhenAllWasSigned) {
   const Probe probe({"sign 3 0100ab"});
@@ -162,6 +163,51 @@ TEST(ExitStatus, ThreeWhenThePageCannotBeWritten) {
             "apktoolkit-sim: cannot write the page /dev/full: No space left on device\n");
 }
 
+// Nobody reads the pipe; with a reader, one that comes a little late, all is well.
+TEST(ExitStatus, ThreeWhenThePageIsAPipeThatNobodyReads) {
+  const Probe probe({"sign 3 0100ab"});
+  const std::string pipe = probe.folder() / "page";
+  ASSERT_EQ(mkfifo(pipe.c_str(), 0600), 0);
+  const ProcessResult unread = Simulated({"--html", pipe, probe.path()});
+  EXPECT_EQ(unread.status, 3);
+  EXPECT_EQ(unread.errors, "apktoolkit-sim: cannot write the page " + pipe + ": nobody reads it\n");
+  const ProcessResult read = InShell("\"$@\" >/dev/null & sleep 0.3; cat \"${@: -2:1}\"; wait $!",
+                                     {"--html", pipe, probe.path()});
+  EXPECT_EQ(read.status, 0);
+  EXPECT_EQ(read.output.substr(0, 15), "<!DOCTYPE html>");
+  EXPECT_EQ(read.output.substr(read.output.size() - 8), "</html>\n");
+}
+
+// Whatever was laid out is no use: the file system, and not the package, is in the way.
+TEST(ExitStatus, ThreeWhenLibrariesCannotBeWritten) {
+  const TempDir folder;
+  const std::string file = folder / "base.apk";
+  MakePackage(WithLibraries({{"lib/arm64-v8a/liba.so", Bytes(3000, 'a')}})).WriteTo(file);
+  const ProcessResult result =
+      RunProcess({"bash", "-c", "trap '' XFSZ; ulimit -f 1; exec \"$@\"", "bash", "env",
+                  "LC_ALL=C.UTF-8", SimulatorPath(), "--quiet", "--install", file});
+  EXPECT_EQ(result.status, 3) << result.output;
+  EXPECT_EQ(result.output, "NOT SIMULATED  " + file + "\n");
+  EXPECT_NE(result.errors.find("its libraries cannot be laid out: "), std::string::npos);
+  EXPECT_NE(result.errors.find("/lib/arm64/liba.so: File too large"), std::string::npos);
+}
+
+TEST(ExitStatus, OneWhenALibraryCannotBeExtracted) {
+  Package package = MakePackage();
+  package.Item("lib/arm64-v8a/libfoo.so").method = 12;
+  const TempDir folder;
+  const std::string file = folder / "lib";
+  package.WriteTo(file);
+  const ProcessResult quiet = Told({"--quiet", "--install", file});
+  EXPECT_EQ(quiet.status, 1);
+  EXPECT_EQ(quiet.output.substr(0, 13), "PARTLY SIGNED") << quiet.output;
+  EXPECT_NE(
+      Told({"--install", file})
+          .output.find(
+              "  ✗ lib/arm64/libfoo.so  not signed: --install cannot extract it from the package"),
+      std::string::npos);
+}
+
 TEST(ExitStatus, ThreeWhenTheStateCannotBeKept) {
   const ProcessResult result = Simulated({"--state", "/dev/null", "/"});
   EXPECT_EQ(result.status, 3);
@@ -193,6 +239,27 @@ TEST(ExitStatus, TwoWhenThePageWouldReplaceAFile) {
                                  "; it is left alone\n");
     EXPECT_EQ(ContentOf(victim), before);
   }
+}
+
+TEST(ExitStatus, TwoWhenATrustedFileOrTheToolWouldBeReplaced) {
+  const TempDir folder;
+  const Probe probe({"sign 3 0000"});
+  // Each begins as the output does, so that nothing but its use speaks for it.
+  const std::string journal = folder.Write("journal", ToBytes("{\"event\":\"journal\"}\n"));
+  const std::string page =
+      folder.Write("page", ToBytes("<!DOCTYPE html>\n<!-- A page of apktoolkit-sim -->\n"));
+  const auto errors = [&](const Lines& words) {
+    const ProcessResult result = Told(words);
+    EXPECT_EQ(result.status, 2);
+    return result.errors;
+  };
+  const std::string end = " is a file that is to be looked at; it is left alone\n";
+  EXPECT_EQ(errors({"--journal", journal, "--trust", journal, probe.path()}),
+            "apktoolkit-sim: --journal " + journal + end);
+  EXPECT_EQ(errors({"--html", page, "--trust", "/dev/null", "--trust", page, probe.path()}),
+            "apktoolkit-sim: --html " + page + end);
+  EXPECT_EQ(errors({"--journal", journal, "--tool", journal, probe.path()}),
+            "apktoolkit-sim: --journal " + journal + end);
 }
 
 TEST(ExitStatus, TwoWhenPageAndJournalAreOneFile) {

@@ -42,15 +42,15 @@ TEST(Options, DefaultIsAHealthyPhone) {
   EXPECT_EQ(options.run.phone.zu_result, 0);
   EXPECT_EQ(options.run.trust, Lines());
   EXPECT_EQ(options.run.state, "");
-  EXPECT_EQ(options.journal, "");
-  EXPECT_EQ(options.html, "");
-  EXPECT_FALSE(options.json);
+  EXPECT_EQ(options.show.journal, "");
+  EXPECT_EQ(options.show.html, "");
+  EXPECT_FALSE(options.show.json);
   EXPECT_EQ(options.run.tool, ProgramDirectory() + "/apktoolkit");
   EXPECT_EQ(options.run.runner, Lines());
   EXPECT_EQ(options.run.timeout, 30);
   EXPECT_EQ(options.run.abi, std::nullopt);
   EXPECT_FALSE(options.judge.is_strict);
-  EXPECT_EQ(options.detail, Detail::kUsual);
+  EXPECT_EQ(options.show.detail, Detail::kUsual);
   EXPECT_EQ(options.run.jobs, 1U);
 }
 
@@ -79,9 +79,9 @@ TEST(Options, TheRestIsTakenAsItIs) {
       Parsed({"--state", "s", "--journal", "j", "--html", "h", "--json", "--tool", "t", "--timeout",
               "0.5", "--runner", "emulator  -L /root", "--", "-a.apk"});
   EXPECT_EQ(options.run.state, "s");
-  EXPECT_EQ(options.journal, "j");
-  EXPECT_EQ(options.html, "h");
-  EXPECT_TRUE(options.json);
+  EXPECT_EQ(options.show.journal, "j");
+  EXPECT_EQ(options.show.html, "h");
+  EXPECT_TRUE(options.show.json);
   EXPECT_EQ(options.run.tool, "t");
   EXPECT_EQ(options.run.timeout, 0.5);
   EXPECT_EQ(options.run.runner, Lines({"emulator", "-L", "/root"}));
@@ -89,8 +89,8 @@ TEST(Options, TheRestIsTakenAsItIs) {
 }
 
 TEST(Options, WordsOfTheRunAreTakenAsTheyAre) {
-  EXPECT_EQ(Parsed({"--quiet", "a.apk"}).detail, Detail::kVerdict);
-  EXPECT_EQ(Parsed({"--verbose", "a.apk"}).detail, Detail::kAll);
+  EXPECT_EQ(Parsed({"--quiet", "a.apk"}).show.detail, Detail::kVerdict);
+  EXPECT_EQ(Parsed({"--verbose", "a.apk"}).show.detail, Detail::kAll);
   EXPECT_TRUE(Parsed({"--strict", "a.apk"}).judge.is_strict);
   EXPECT_EQ(Parsed({"--jobs", "8", "a.apk"}).run.jobs, 8U);
 }
@@ -116,6 +116,8 @@ TEST(Options, MistakesAreReportedWithStatusTwo) {
                                        {"--trust", "/nowhere/at-all", "a.apk"},
                                        {"--timeout", "0", "a.apk"},
                                        {"--timeout", "-1", "a.apk"},
+                                       {"--timeout", "nan", "a.apk"},
+                                       {"--timeout", "inf", "a.apk"},
                                        {"--jobs", "0", "a.apk"},
                                        {"--jobs", "x", "a.apk"},
                                        {"--install=x86", "a.apk"},

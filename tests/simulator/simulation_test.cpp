@@ -3,9 +3,12 @@
 #include <sys/stat.h>
 #include <unistd.h>
 
+#include <csignal>
 #include <filesystem>
+#include <sstream>
 
 #include "simulator/simulated.h"
+#include "support/package.h"
 
 TEST(Files, AreSetApartAndSummedUp) {
   const Probe good({"sign 3 0000"});
@@ -70,10 +73,46 @@ TEST(Files, ShowProgressOnATerminalWhenItTakesLonger) {
   EXPECT_NE(verdict, std::string::npos) << result.output;
 }
 
+// Runs a command, sends it `signal` as soon as a file that `pattern` names has something in it, and
+// gives the signal by which it ended (0 if by none) and the seconds that this took.
+struct Interrupted {
+  Interrupted(const std::string& pattern, const Lines& words, int signal = SIGTERM) {
+    const TempDir folder;
+    const std::string out = folder / "out";
+    Lines command = {"python3", "-c", R"(
+import glob, os, signal, subprocess, sys, time
+out, pattern, number, command = sys.argv[1], sys.argv[2], int(sys.argv[3]), sys.argv[4:]
+signal.signal(number, signal.SIG_DFL)
+child = subprocess.Popen(command, stdout=open(out, "w"))
+while child.poll() is None and not any(os.path.getsize(name) for name in glob.glob(pattern)):
+    time.sleep(0.02)
+begin = time.monotonic()
+child.send_signal(number)
+status = child.wait()
+print(-status, time.monotonic() - begin))", out, pattern, std::to_string(signal)};
+    command.insert(command.end(), words.begin(), words.end());
+    std::istringstream(RunProcess(command).output) >> ended_by >> seconds;
+    output = ContentOf(out);
+  }
+
+  int ended_by = -1;
+  double seconds = 1e9;
+  std::string output;
+};
+
 TEST(Interruption, EndsTheToolAndTheSimulatorByTheSignal) {
-  const Probe slow({"sign 3 0000", "sleep 60"});
-  const ProcessResult result = InShell("\"$@\" & sleep 1; kill -TERM $!; wait $!", {slow.path()});
-  EXPECT_EQ(result.status, 128 + 15);
+  for (const int signal : {SIGTERM, SIGINT, SIGHUP}) {
+    const Probe slow({"sign 3 0000", "pid", "sleep 60"});
+    const std::string pid = slow.path() + ".pid";
+    const Interrupted run(
+        pid, {"env", "LC_ALL=C.UTF-8", SimulatorPath(), "--tool", PROBE_PATH, slow.path()}, signal);
+    EXPECT_EQ(run.ended_by, signal);
+    EXPECT_LT(run.seconds, 20) << "the tool sleeps for 60 seconds";
+    EXPECT_EQ(kill(std::stoi(ContentOf(pid)), 0), -1) << "the tool has ended, too";
+    const std::string start =
+        "NOT SIMULATED  " + slow.path() + "\n  ✗ tool  it was interrupted\n      Run it again.\n";
+    EXPECT_EQ(run.output.substr(0, start.size()), start);
+  }
 }
 
 // Names may come from whoever made the files.
@@ -140,15 +179,29 @@ TEST(Page, IsWrittenAnewForAllFilesInTheirOrder) {
   EXPECT_TRUE(first < second && second < third && third != std::string::npos) << text;
 }
 
+// What shows a journal to a person is not deceived by it.
+TEST(Journal, HasNoHiddenCharacters) {
+  const TempDir folder;
+  const std::string odd = folder.Write("\u0085\u202e\u200b", ToBytes("sign 3 0000\n"));
+  const ProcessResult result = Simulated({"--json", odd});
+  for (const char* hidden : {"\u0085", "\u202e", "\u200b"}) {
+    EXPECT_EQ(result.output.find(hidden), std::string::npos) << result.output;
+  }
+  EXPECT_EQ(ParseJournal(result.output)[1]["file"], odd);
+}
+
 TEST(Page, OfAnInterruptedRunHasWhatWasDone) {
   const Probe good({"sign 3 0000"});
-  const Probe slow({"sign 3 0000", "sleep 60"});
+  const Probe slow({"sign 3 0000", "pid", "sleep 60"});
   const std::string page = good.folder() / "page.html";
-  const ProcessResult result = InShell("\"$@\" & sleep 1; kill -TERM $!; wait $!",
-                                       {"--html", page, good.path(), slow.path()});
-  EXPECT_EQ(result.status, 128 + 15);
-  EXPECT_NE(ContentOf(page).find("<bdi>" + good.path() + "</bdi>"), std::string::npos);
-  EXPECT_NE(ContentOf(page).find("</html>\n"), std::string::npos);
+  const Interrupted run(slow.path() + ".pid", {SimulatorPath(), "--tool", PROBE_PATH, "--html",
+                                               page, good.path(), slow.path(), good.path()});
+  EXPECT_EQ(run.ended_by, SIGTERM);
+  const std::string text = ContentOf(page);
+  EXPECT_NE(text.find("<bdi>" + good.path() + "</bdi>"), std::string::npos);
+  EXPECT_NE(text.find("<p>2 files: 1 trusted JAR, 1 not simulated</p>"), std::string::npos) << text;
+  EXPECT_NE(text.find("it was interrupted"), std::string::npos);
+  EXPECT_NE(text.find("</html>\n"), std::string::npos);
 }
 
 TEST(Simulation, FollowsLinksToTheFile) {
@@ -177,6 +230,45 @@ TEST(Simulation, WorksFromAFolderThatTheLoaderCannotName) {
   EXPECT_EQ(FirstLines(result, 3),
             Lines({"TRUSTED JAR  " + probe.path(), "  + JAR  signed, without data",
                    "  + key  registered for name"}));
+}
+
+// A runner that does something to the file first.
+std::string RunnerThat(const std::string& does, const TempDir& folder) {
+  const std::string runner =
+      folder.Write("runner", ToBytes("#!/bin/sh\n" + does + "\nshift\nexec env \"$@\"\n"));
+  EXPECT_EQ(chmod(runner.c_str(), 0755), 0);
+  return runner;
+}
+
+TEST(Simulation, TellsThatTheFileWasChangedMeanwhile) {
+  if (AreProgramsEmulated()) GTEST_SKIP() << "there is a runner already";
+  const TempDir folder;
+  const std::string file = folder / "base.apk";
+  MakePackage().WriteTo(file);
+  const std::string runner = RunnerThat("touch " + file, folder);
+  const std::string changed = "   ! it was changed while it was looked at";
+  EXPECT_NE(Told({"--quiet", "--runner", runner, file}).output.find(changed), std::string::npos);
+  EXPECT_EQ(Told({"--quiet", file}).output.find(changed), std::string::npos);
+  // What the tool could not open, nobody changed.
+  EXPECT_EQ(Told({"--quiet", folder.path()}).output.find(changed), std::string::npos);
+}
+
+// The directory is mapped by the tool and by the simulator, and is cut off again and again.
+TEST(Simulation, SurvivesAFileThatShrinksAndGoesOnToTheNext) {
+  PackageOptions options;
+  for (int i = 0; i < 20000; ++i) options.entries.push_back({"assets/" + std::to_string(i), {}});
+  const TempDir folder;
+  MakePackage(options).WriteTo(folder / "whole.apk");
+  MakePackage().WriteTo(folder / "good.apk");
+  const std::string script =
+      "cd \"$1\"; sim=$2; cp whole.apk base.apk\n"
+      "(while [ ! -e end ]; do truncate -s 3000 base.apk; cp whole.apk base.apk; done) & loop=$!\n"
+      "for i in $(seq 30); do \"$sim\" --quiet base.apk good.apk >out; status=$?\n"
+      "  [ $status = 1 ] || [ $status = 0 ] || echo \"status $status\"\n"
+      "  grep -q '^SIGNED  good.apk' out || cat out\ndone; touch end; wait $loop";
+  const ProcessResult result =
+      RunProcess({"bash", "-c", script, "bash", folder.path(), SimulatorPath()});
+  EXPECT_EQ(result.output, "");
 }
 
 TEST(Simulation, RunnerGetsThePreloadForTheTool) {

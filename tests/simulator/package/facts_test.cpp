@@ -1,12 +1,16 @@
 #include "simulator/package/facts.h"
 
+#include <fcntl.h>
 #include <gtest/gtest.h>
 #include <sys/stat.h>
 #include <unistd.h>
 
 #include <algorithm>
 #include <cerrno>
+#include <csignal>
+#include <map>
 
+#include "simulator/package/signing_block.h"
 #include "support/files.h"
 #include "support/package.h"
 #include "support/signing_block.h"
@@ -43,7 +47,7 @@ TEST(FileKind, IsToldByWhatTheFileIs) {
   const TempDir folder;
   const std::string pipe = folder / "pipe";
   ASSERT_EQ(mkfifo(pipe.c_str(), 0600), 0);
-  EXPECT_EQ(LookAt(folder.path()).kind, FileKind::kFolder);
+  EXPECT_EQ(LookAt(folder.path()).kind, FileKind::kDirectory);
   EXPECT_EQ(LookAt(pipe).kind, FileKind::kSpecial);
   EXPECT_EQ(LookAt("/dev/zero").kind, FileKind::kSpecial);
   EXPECT_EQ(FactsOf({}).kind, FileKind::kEmpty);
@@ -71,14 +75,12 @@ TEST(PackageFacts, OfASignedPackage) {
   const PackageFacts facts = FactsOf(package.Build());
 
   EXPECT_EQ(facts.archive_result, 0);
-  EXPECT_TRUE(facts.is_package);
   EXPECT_EQ(facts.manifest.package_name, "com.example.app");
-  EXPECT_TRUE(facts.jar.has_manifest);
-  EXPECT_TRUE(facts.jar.can_read_manifest);
+  EXPECT_EQ(facts.jar.manifest, Archive::ReadResult::kRead);
   EXPECT_TRUE(facts.jar.has_manifest_digest);
   EXPECT_EQ(facts.jar.signature_files, std::vector<std::string>({"META-INF/CERT.SF"}));
   EXPECT_EQ(facts.jar.block_name, "META-INF/CERT.RSA");
-  EXPECT_EQ(facts.jar.signer_count, 1U);
+  EXPECT_EQ(facts.jar.block.signer_count, 1U);
   ASSERT_TRUE(facts.jar.certificate.has_value());
   EXPECT_EQ(facts.jar.certificate->key.bits, 2048);
   EXPECT_EQ(facts.libraries.size(), 2U);
@@ -109,9 +111,8 @@ TEST(PackageFacts, OfNewerSigners) {
 
 TEST(PackageFacts, OfAJar) {
   const PackageFacts facts = FactsOf(MakePackage(PlainJar()).Build());
-  EXPECT_FALSE(facts.is_package);
-  EXPECT_EQ(facts.manifest.package_name, "");
-  EXPECT_TRUE(facts.jar.has_manifest);
+  EXPECT_EQ(facts.manifest.package_name, std::nullopt);
+  EXPECT_EQ(facts.jar.manifest, Archive::ReadResult::kRead);
 }
 
 TEST(PackageFacts, EntryThatLiesAboutItsLengthIsNotRead) {
@@ -119,6 +120,105 @@ TEST(PackageFacts, EntryThatLiesAboutItsLengthIsNotRead) {
   ZipItem& manifest = package.Item(kManifestName);
   manifest = ClaimingLength(manifest, 0xfffffff0);
   const PackageFacts facts = FactsOf(package.Build());
-  EXPECT_TRUE(facts.jar.has_manifest);
-  EXPECT_FALSE(facts.jar.can_read_manifest);
+  EXPECT_EQ(facts.jar.manifest, Archive::ReadResult::kDamaged);
+}
+
+TEST(PackageFacts, ListedAreTheEntriesThatTheToolFindsADigestFor) {
+  const std::string manifest =
+      "Manifest-Version: 1.0\r\n\r\nName: a\r\nSHA-256-Digest: x\r\n\r\nName: b\r\n\r\n"
+      "Name: c\r\nMD5-Digest: y\r\n\r\n";
+  PackageOptions options = WithManifest(manifest);
+  for (const char* name : {"a", "b", "c"}) options.entries.push_back({name, ToBytes("x")});
+  const PackageFacts facts = FactsOf(MakePackage(options).Build());
+  EXPECT_EQ(NamesWhere(facts, [](const auto& e) { return e.is_listed; }),
+            std::vector<std::string>({"a", "c"}));
+}
+
+// What lies below a directory of META-INF is an entry like others.
+TEST(PackageFacts, SignatureFilesLieInMetaInfItself) {
+  Package package = MakePackage();
+  for (const char* name :
+       {"META-INF/sub/A.SF", "META-INF/A.EC", "META-INF/A.DSA", "A.RSA", "META-INF/A.RSA.txt"}) {
+    package.items.push_back({name, ToBytes("x")});
+  }
+  EXPECT_EQ(NamesWhere(FactsOf(package.Build()), [](const auto& e) { return e.is_signature; }),
+            std::vector<std::string>({"META-INF/A.DSA", "META-INF/A.EC", "META-INF/CERT.RSA",
+                                      "META-INF/CERT.SF", "META-INF/MANIFEST.MF"}));
+}
+
+TEST(PackageFacts, DamagedEntriesAreThereAllTheSame) {
+  PackageOptions options = WithLibraries({{"lib/arm64-v8a/liba.so", ToBytes("a")}});
+  Package package = MakePackage(options);
+  package.Item("lib/arm64-v8a/liba.so").local.crc = 1;
+  package.items.push_back({"classes2.dex", ToBytes("another's")});
+  const PackageFacts facts = FactsOf(package.Build());
+  EXPECT_EQ(NamesWhere(facts, [](const auto& e) { return e.entry.is_damaged; }),
+            std::vector<std::string>({"lib/arm64-v8a/liba.so"}));
+  EXPECT_EQ(NamesWhere(facts, [](const auto& e) { return !e.is_listed && !e.is_signature; }),
+            std::vector<std::string>({"classes2.dex"}));
+  ASSERT_EQ(facts.libraries.size(), 1U);
+  EXPECT_EQ(facts.libraries[0].entry, "lib/arm64-v8a/liba.so");
+  EXPECT_FALSE(facts.libraries[0].is_met);
+}
+
+TEST(PackageFacts, TellWhatIsTooLongToBeLookedInto) {
+  Package package = MakePackage();
+  ZipItem& manifest = package.Item(kManifestName);
+  manifest.data.resize(Archive::kLongestRead + 1, ' ');
+  manifest.deflated = true;
+  const Bytes huge = SigningBlockBytes({{7, Bytes(kMostBlockBytes, 0)}});
+  const PackageFacts facts = FactsOf(ArchiveWithBlock(package.Build(), huge));
+  EXPECT_EQ(facts.jar.manifest, Archive::ReadResult::kTooLong);
+  EXPECT_EQ(facts.too_long,
+            std::vector<std::string>({kManifestName, "the block of the schemes after v1"}));
+  EXPECT_FALSE(facts.has_damaged_signing_block);
+}
+
+// Told by opening each as the tool does: nothing is waited for.
+TEST(PackageFacts, TellWhatLiesWhereTheToolLooksForALibrary) {
+  const std::vector<std::string> names = {"there", "missing", "pipe", "loop", "leased"};
+  PackageOptions options;
+  for (const std::string& name : names) {
+    options.entries.push_back({"lib/arm64-v8a/" + name + ".so", ToBytes(name)});
+  }
+  options.entries.push_back({"lib/armeabi/other.so", ToBytes("x")});
+  options.entries.push_back({"lib/x86/other.so", ToBytes("x")});
+  const TempDir folder;
+  const std::string file = folder / "base.apk";
+  MakePackage(options).WriteTo(file);
+  folder.Write("lib/arm64/there.so", ToBytes("x"));
+  const std::string leased = folder.Write("lib/arm64/leased.so", ToBytes("x"));
+  ASSERT_EQ(mkfifo((folder / "lib/arm64/pipe.so").c_str(), 0600), 0);
+  ASSERT_EQ(symlink("loop.so", (folder / "lib/arm64/loop.so").c_str()), 0);
+  signal(SIGIO, SIG_IGN);
+  const int holder = open(leased.c_str(), O_RDWR);
+  ASSERT_EQ(fcntl(holder, F_SETLEASE, F_WRLCK), 0);
+  std::map<std::string, LibraryFacts> found;
+  for (const LibraryFacts& library : LookAt(file).libraries) found[library.entry] = library;
+  fcntl(holder, F_SETLEASE, F_UNLCK);
+  close(holder);
+  const auto error = [&](const std::string& name) {
+    return found["lib/arm64-v8a/" + name + ".so"].error;
+  };
+  EXPECT_EQ(error("there"), 0);
+  EXPECT_EQ(error("missing"), ENOENT);
+  EXPECT_EQ(error("pipe"), 0);
+  EXPECT_EQ(error("loop"), ELOOP);
+  EXPECT_EQ(error("leased"), EWOULDBLOCK);
+  EXPECT_EQ(found["lib/arm64-v8a/there.so"].place, "lib/arm64/there.so");
+  EXPECT_TRUE(found["lib/arm64-v8a/missing.so"].has_directory);
+  EXPECT_EQ(found["lib/armeabi/other.so"].place, "lib/arm/other.so");
+  EXPECT_FALSE(found["lib/armeabi/other.so"].has_directory);
+  EXPECT_EQ(found["lib/x86/other.so"].place, "");
+}
+
+// Libraries lie beside the file itself, and not beside a link to it.
+TEST(PackageFacts, LibrariesAreLookedForBesideTheFileItself) {
+  const TempDir folder;
+  MakePackage().WriteTo(folder.File("app/base.apk"));
+  folder.Write("app/lib/arm64/libfoo.so", ToBytes("x"));
+  ASSERT_EQ(symlink("app/base.apk", (folder / "link").c_str()), 0);
+  const PackageFacts facts = LookAt(folder / "link");
+  ASSERT_EQ(facts.libraries.size(), 1U);
+  EXPECT_EQ(facts.libraries[0].error, 0);
 }

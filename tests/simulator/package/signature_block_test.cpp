@@ -22,10 +22,11 @@ TEST(SignatureBlockFacts, OfABlockAsApksignerMakesIt) {
   const SignatureBlockFacts facts = ParseSignatureBlock(View(der));
   EXPECT_TRUE(facts.is_whole);
   EXPECT_EQ(facts.certificate, View(block.SignerCertificate().Build()));
-  EXPECT_EQ(facts.certificate_count, 1U);
   EXPECT_EQ(facts.signer_count, 1U);
   EXPECT_FALSE(facts.has_signed_attributes);
-  EXPECT_EQ(facts.digest, "SHA-256");
+  EXPECT_EQ(facts.digest, "SHA256");
+  EXPECT_TRUE(facts.has_known_digest);
+  EXPECT_FALSE(facts.has_pss);
 }
 
 TEST(SignatureBlockFacts, SeeSignedAttributes) {
@@ -35,17 +36,45 @@ TEST(SignatureBlockFacts, SeeSignedAttributes) {
   const Bytes der = block.Build(kSignatureFile);
   const SignatureBlockFacts facts = ParseSignatureBlock(View(der));
   EXPECT_TRUE(facts.has_signed_attributes);
-  EXPECT_EQ(facts.digest, "SHA-1");
+  EXPECT_EQ(facts.digest, "SHA1");
+  EXPECT_TRUE(facts.has_known_digest);
 }
 
-TEST(SignatureBlockFacts, CountCertificatesAndSigners) {
+TEST(SignatureBlockFacts, OfSeveralTheFirstIsTold) {
   SignatureBlock block;
   const Bytes certificate = block.SignerCertificate().Build();
-  block.certificates = Concat({certificate, certificate});
-  const Bytes one = SignatureBlock().Build(kSignatureFile);
-  const SignatureBlockFacts facts = ParseSignatureBlock(View(block.Build(kSignatureFile)));
-  EXPECT_EQ(facts.certificate_count, 2U);
-  EXPECT_EQ(facts.signer_count, 1U);
+  Certificate other;
+  other.serial = der::Integer(7);
+  block.certificates = Concat({certificate, other.Build()});
+  SignatureBlock second;
+  second.digest = Digest::kSha1;
+  second.serial = der::Integer(7);
+  block.signer_infos =
+      der::Set({block.SignerInfo(kSignatureFile), second.SignerInfo(kSignatureFile),
+                second.SignerInfo(kSignatureFile)});
+  const Bytes der = block.Build(kSignatureFile);
+  const SignatureBlockFacts facts = ParseSignatureBlock(View(der));
+  EXPECT_EQ(facts.certificate, View(certificate));
+  EXPECT_EQ(facts.signer_count, 3U);
+  EXPECT_EQ(facts.digest, "SHA256");
+  // Issuer and serial number, as the certificate has them.
+  const Bytes id = Concat({Certificate().issuer, Certificate().serial});
+  EXPECT_EQ(facts.signer_id, std::string(id.begin(), id.end()));
+}
+
+TEST(SignatureBlockFacts, DigestsThatTheToolDoesNotReadHaveTheirNames) {
+  const auto digest = [](const std::string& oid) {
+    SignatureBlock block;
+    block.digest_algorithm = AlgorithmIdentifier(oid);
+    const Bytes der = block.Build(kSignatureFile);
+    const SignatureBlockFacts facts = ParseSignatureBlock(View(der));
+    EXPECT_TRUE(facts.is_whole);
+    return facts.digest + (facts.has_known_digest ? " is known" : "");
+  };
+  EXPECT_EQ(digest(DigestOid(Digest::kMd5)), "MD5 is known");
+  EXPECT_EQ(digest("2.16.840.1.101.3.4.2.2"), "SHA384");
+  EXPECT_EQ(digest("2.16.840.1.101.3.4.2.3"), "SHA512");
+  EXPECT_EQ(digest("1.2.3.4"), "1.2.3.4");
 }
 
 TEST(SignatureBlockFacts, OfACutBlockAreThoseBeforeTheCut) {

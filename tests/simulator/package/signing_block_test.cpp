@@ -2,7 +2,6 @@
 
 #include <gtest/gtest.h>
 
-#include "simulator/package/archive_end.h"
 #include "support/files.h"
 #include "support/signing_block.h"
 #include "support/zip.h"
@@ -43,6 +42,19 @@ TEST(SigningBlock, EachSchemeHasItsSigners) {
 
 TEST(SigningBlock, NothingIsNoBlock) { EXPECT_EQ(Read({}), Lines()); }
 
+// The platform takes the first, and does not look at another of the same scheme.
+TEST(SigningBlock, OfTwoValuesForASchemeTheFirstCounts) {
+  const Bytes own = Signers({SignerBytes(ToBytes("OWN"))});
+  const Bytes other = Signers({SignerBytes(ToBytes("OTHER"))});
+  EXPECT_EQ(Read(SigningBlockBytes({{kSchemeV2, own}, {kSchemeV2, other}, {kSchemeV3, other}})),
+            Lines({"v2 OWN", "v3 OTHER"}));
+  EXPECT_EQ(Read(SigningBlockBytes({{kSchemeV2, own}, {kSchemeV2, {}}})), Lines({"v2 OWN"}));
+}
+
+TEST(SigningBlock, SchemeWithoutSignersIsDamage) {
+  EXPECT_EQ(Read(SigningBlockBytes({{kSchemeV2, Signers({})}})), Lines({"damaged"}));
+}
+
 TEST(SigningBlock, WithoutAKnownSchemeHasNoSigners) {
   EXPECT_EQ(Read(SigningBlockBytes({{7, ToBytes("whatever")}})), Lines());
   EXPECT_EQ(Read(SigningBlockBytes({})), Lines());
@@ -80,9 +92,21 @@ TEST(SigningBlock, SignersBeyondReasonAreNotRead) {
 namespace {
 
 // What is read of an archive with this in front of its central directory.
-std::string ReadFrom(const Bytes& block, const std::string& comment = "") {
+std::string ReadFrom(const Bytes& block, const std::string& comment = "",
+                     bool expect_too_large = false) {
   const MemoryFile file(ArchiveWithBlock(BuildZip({{"a", ToBytes("data")}}), block, comment));
-  return ReadSigningBlock(file.fd());
+  const auto end = FindArchiveEnd(file.fd());
+  if (!end) return "no end";
+  bool is_too_large = !expect_too_large;
+  const std::string read = ReadSigningBlock(file.fd(), *end, &is_too_large);
+  EXPECT_EQ(is_too_large, expect_too_large);
+  return read;
+}
+
+// A block of `size` bytes behind its first size field.
+Bytes BlockOfSize(uint64_t size) {
+  // Two sizes and the magic, the pair's own size and its number.
+  return SigningBlockBytes({{7, Bytes(static_cast<size_t>(size) - 8 - 16 - 8 - 4, 0)}});
 }
 
 }  // namespace
@@ -107,19 +131,15 @@ TEST(ReadSigningBlock, ThereIsNoneWithoutMagicOrRoom) {
   EXPECT_EQ(ReadFrom(too_short), "");
 }
 
-TEST(ReadSigningBlock, ThereIsNoneWithoutAnArchive) {
-  const MemoryFile empty({});
-  EXPECT_EQ(ReadSigningBlock(empty.fd()), "");
-  const MemoryFile text(ToBytes("no archive, but long enough to hold the record of an end"));
-  EXPECT_EQ(ReadSigningBlock(text.fd()), "");
-  EXPECT_EQ(ReadSigningBlock(-1), "");
+// To the platform a block has the same size in front and behind.
+TEST(ReadSigningBlock, ThereIsNoneWhereTheTwoSizesDiffer) {
+  Bytes block = SigningBlockBytes({{kSchemeV2, Signers({kSigner})}});
+  ++block[0];
+  EXPECT_EQ(ReadFrom(block), "");
 }
 
-TEST(ArchiveEnd, MayLieAboutItsDirectory) {
-  Bytes zip = BuildZip({{"a", ToBytes("data")}});
-  zip[zip.size() - 22 + 19] = 0xff;  // the highest byte of the directory's offset
-  const MemoryFile file(zip);
-  ASSERT_TRUE(FindArchiveEnd(file.fd()).has_value());
-  EXPECT_GT(FindArchiveEnd(file.fd())->directory_offset, zip.size());
-  EXPECT_EQ(ReadSigningBlock(file.fd()), "");
+TEST(ReadSigningBlock, LargestThatIsReadHasSixteenMebibytes) {
+  const Bytes largest = BlockOfSize(kMostBlockBytes);
+  EXPECT_EQ(ReadFrom(largest), View(largest));
+  EXPECT_EQ(ReadFrom(BlockOfSize(kMostBlockBytes + 1), "", true), "");
 }

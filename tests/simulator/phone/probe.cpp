@@ -27,6 +27,18 @@ extern "C" int fcntl64(int, int, ...);
 
 namespace {
 
+// Writes a record as the platform's C++ libraries do.
+template <typename Data = __android_logger_data, typename Message = __android_log_message>
+void WriteLogRecord(int priority, const char* tag, const char* text) {
+  if constexpr (kLogLibraryHas<Message>) {
+    Message message = {sizeof(message), LOG_ID_MAIN, priority, tag, nullptr, 0, text};
+    __android_log_write_log_message(&message);
+  } else {
+    Data data = {sizeof(data), LOG_ID_MAIN, priority, tag, nullptr, 0};
+    __android_log_write_logger_data(&data, text);
+  }
+}
+
 using Words = std::vector<std::string>;
 using Command = std::function<long(const Words&)>;
 
@@ -84,6 +96,14 @@ long Limit(const Words& words) {
   return setrlimit(RLIMIT_NOFILE, &limit);
 }
 
+std::string g_file;
+
+// For who wants to see whether this process is gone.
+long WriteId(const Words&) {
+  std::ofstream(g_file + ".pid") << getpid() << std::endl;
+  return 0;
+}
+
 // How many descriptors would be open in a program that this one turned into.
 long Inherited(const Words&) {
   long count = 0;
@@ -139,6 +159,7 @@ const std::map<std::string, Command> kCommands = {
     {"puts", [](const Words& w) { return puts(w[1].c_str()); }},
     {"limit", Limit},
     {"inherited", Inherited},
+    {"pid", WriteId},
     {"has-variable", [](const Words& w) { return getenv(w[1].c_str()) == nullptr ? 0L : 1L; }},
     {"exit", [](const Words& w) -> long { _exit(Int(w[1])); }},
     {"kill", [](const Words& w) { return raise(Int(w[1])); }},
@@ -161,6 +182,7 @@ void Do(const std::string& line, std::ofstream& out) {
 
 int main(int argc, char** argv) {
   if (argc != 2) return 1;
+  g_file = argv[1];
   // Before all else, as the tool does.
   const int fd = open(argv[1], O_RDONLY);
   std::string script(1 << 20, '\0');

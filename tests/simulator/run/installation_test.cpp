@@ -1,10 +1,13 @@
 #include "simulator/run/installation.h"
 
+#include <fcntl.h>
 #include <gtest/gtest.h>
 #include <sys/mman.h>
+#include <sys/resource.h>
 #include <unistd.h>
 
 #include <algorithm>
+#include <csignal>
 #include <filesystem>
 
 #include "support/compiled_manifest.h"
@@ -104,16 +107,77 @@ TEST(Installation, NamesDoNotLeadOutOfTheirFolder) {
                              "lib/libd.so"}));
 }
 
-TEST(Installation, LeavesOutWhatCannotBeExtracted) {
-  ZipItem damaged = {"lib/arm64-v8a/libb.so", ToBytes("damaged")};
-  damaged.local.crc = damaged.central.crc = 1;
-  damaged.deflated = true;
-  damaged.raw = ToBytes("no deflate stream");
-  Files left_out;
-  EXPECT_EQ(
-      LaidOut({{"lib/arm64-v8a/liba.so", ToBytes("good")}, damaged}, InstalledAbi::kAll, &left_out),
-      Files({"lib/arm64/liba.so good"}));
-  EXPECT_EQ(left_out, Files({"lib/arm64-v8a/libb.so"}));
+TEST(Installation, TellsWhatCannotBeExtracted) {
+  ZipItem undeflatable = {"lib/arm64-v8a/libdata.so", ToBytes("data")};
+  undeflatable.deflated = true;
+  undeflatable.raw = ToBytes("no deflate stream");
+  ZipItem unknown = {"lib/arm64-v8a/libmethod.so", ToBytes("data")};
+  unknown.method = 12;
+  ZipItem crc = {"lib/arm64-v8a/libcrc.so", ToBytes("data")};
+  crc.local.crc = 1;
+  ZipItem size = {"lib/arm64-v8a/libsize.so", ToBytes("data")};
+  size.local.length = 5;
+  const TempDir folder;
+  const std::string file = folder / "base.apk";
+  const ZipItem good = {"lib/arm64-v8a/liba.so", ToBytes("good")};
+  MakePackage(WithLibraries({undeflatable, good, unknown, crc, size})).WriteTo(file);
+  Installation installation;
+  EXPECT_EQ(installation.LayOut(file, InstalledAbi::kAll, kLater), std::nullopt);
+  Files lost = installation.not_extracted();
+  std::sort(lost.begin(), lost.end());
+  EXPECT_EQ(lost, Files({crc.name, undeflatable.name, unknown.name, size.name}));
+  EXPECT_EQ(installation.left_out(), Files());
+  const fs::path place = fs::path(installation.path()).parent_path();
+  EXPECT_TRUE(fs::exists(place / "lib/arm64/liba.so"));
+  EXPECT_FALSE(fs::exists(place / "lib/arm64/libdata.so"));
+}
+
+// Its own name cannot stand in the way of what is laid out beside it.
+TEST(Installation, OfAFileThatIsCalledAsALibrarysDirectory) {
+  const TempDir folder;
+  const std::string file = folder / "lib";
+  MakePackage().WriteTo(file);
+  Installation installation;
+  EXPECT_EQ(installation.LayOut(file, InstalledAbi::kAll, kLater), std::nullopt);
+  const fs::path place = fs::path(installation.path()).parent_path();
+  EXPECT_EQ(installation.path(), place / "base.apk");
+  EXPECT_EQ(ContentOf(place / "lib/arm64/libfoo.so"), "\177ELF foo");
+}
+
+// The first write that does not fit, into the copy or into a library.
+TEST(Installation, SaysWhenItCannotWrite) {
+  const TempDir folder;
+  const std::string file = folder / "base.apk";
+  MakePackage(WithLibraries({{"lib/arm64-v8a/liba.so", Bytes(3000, 'a')}})).WriteTo(file);
+  const auto problem_with = [&file](rlim_t most) {
+    rlimit before = {};
+    getrlimit(RLIMIT_FSIZE, &before);
+    const rlimit limit = {most, before.rlim_max};
+    signal(SIGXFSZ, SIG_IGN);
+    setrlimit(RLIMIT_FSIZE, &limit);
+    Installation installation;
+    const auto problem = installation.LayOut(file, InstalledAbi::kAll, kLater);
+    setrlimit(RLIMIT_FSIZE, &before);
+    EXPECT_TRUE(installation.not_extracted().empty());
+    return problem.value_or("");
+  };
+  const std::string problem = problem_with(2000);
+  EXPECT_NE(problem.find("/lib/arm64/liba.so: File too large"), std::string::npos) << problem;
+  EXPECT_EQ(problem_with(3000), "");
+}
+
+// A lease is not waited for: the tool, which waits, tells of it.
+TEST(Installation, DoesNotWaitForWhoHoldsALease) {
+  const TempDir folder;
+  const std::string file = folder / "base.apk";
+  MakePackage().WriteTo(file);
+  signal(SIGIO, SIG_IGN);
+  const int holder = open(file.c_str(), O_RDWR);
+  ASSERT_EQ(fcntl(holder, F_SETLEASE, F_WRLCK), 0);
+  Installation installation;
+  EXPECT_EQ(installation.LayOut(file, InstalledAbi::kAll, kLater), std::nullopt);
+  EXPECT_EQ(installation.path(), file);
+  close(holder);
 }
 
 TEST(Installation, IsGoneWithItsOwner) {
@@ -174,4 +238,18 @@ TEST(Installation, SaysWhenThereIsNoPlaceForIt) {
   const auto problem = installation.LayOut(file, InstalledAbi::kPreferred, kLater);
   setenv("TMPDIR", kept.c_str(), 1);
   EXPECT_TRUE(problem.has_value());
+}
+
+// What is written when an interruption comes is not waited for: however much time is left.
+TEST(Installation, EndsWhenTheProcessIsToEnd) {
+  const TempDir folder;
+  const std::string file = folder / "base.apk";
+  MakePackage(WithLibraries({kBoth[0]})).WriteTo(file);
+  const auto lay_out = [&] {
+    CatchInterruptions();
+    raise(SIGTERM);
+    const auto objection = Installation().LayOut(file, InstalledAbi::kAll, kLater);
+    _exit(objection == std::nullopt ? 1 : 0);
+  };
+  EXPECT_EXIT(lay_out(), testing::ExitedWithCode(0), "");
 }

@@ -1,5 +1,6 @@
 #include "simulator/run/signed_bytes.h"
 
+#include <fcntl.h>
 #include <gtest/gtest.h>
 #include <sys/stat.h>
 #include <unistd.h>
@@ -41,6 +42,21 @@ TEST(SignedBytes, OfTheSameFileAreTrustedUnlessItWasTouched) {
   // Nothing need be read for that.
   EXPECT_TRUE(bytes.Holds(file, kPassed));
   folder.Write("file", ToBytes("abd"));
+  EXPECT_FALSE(bytes.Holds(file, kLater));
+}
+
+// The same length and the same time of the last change: that of its state is another.
+TEST(SignedBytes, ThatWereChangedWithoutASignInTheirTimeAreNotTrusted) {
+  const TempDir folder;
+  const std::string file = folder.Write("file", ToBytes("abc"));
+  struct stat before = {};
+  ASSERT_EQ(stat(file.c_str(), &before), 0);
+  SignedBytes bytes("", true);
+  ASSERT_TRUE(bytes.Add(file, kLater));
+  usleep(20000);  // the clock of file systems is coarse
+  folder.Write("file", ToBytes("abd"));
+  const timespec times[] = {before.st_atim, before.st_mtim};
+  ASSERT_EQ(utimensat(AT_FDCWD, file.c_str(), times, 0), 0);
   EXPECT_FALSE(bytes.Holds(file, kLater));
 }
 

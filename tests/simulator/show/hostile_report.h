@@ -18,7 +18,7 @@ inline const char kHostileText[] =
 inline CertificateFacts HostileCertificate(const std::string& text) {
   CertificateFacts certificate;
   certificate.subject = certificate.sha256 = text;
-  certificate.key = {text, 2048, text, text + std::string(64, '0'), text};
+  certificate.key = {text, 2048, text, text + std::string(64, '0')};
   return certificate;
 }
 
@@ -47,7 +47,8 @@ inline Report HostileReport(const std::string& text) {
       {ItemKind::kLibrary, text, text, ItemState::kAbsent, {&cause::kToolError, text}},
       {ItemKind::kKey, text, text, ItemState::kDone, {}},
       {ItemKind::kTool, text, text, ItemState::kRefused, {&cause::kToolNotStarted, text}}};
-  report.warnings = {{&cause::kOtherKey, text}, {&cause::kSeveralSigners, text}};
+  report.warnings = {{&cause::kOtherKey, text}, {&cause::kOtherPackageName, text}};
+  report.key = {std::string(64, '0'), 2048, true};
   report.signer = HostileCertificate(text);
   report.schemes = {text};
   report.newer = {{text, HostileCertificate(text + "!")}};

@@ -6,7 +6,6 @@
 
 #include "simulator/phone/text.h"
 #include "simulator/show/hostile_report.h"
-#include "simulator/show/page_template.h"
 
 using namespace simulator;
 
@@ -61,7 +60,8 @@ TEST(Page, SaysWhatTheTerminalSays) {
   report.signer.emplace();
   report.signer->subject = "CN=Vault";
   report.signer->sha256 = std::string(64, 'c');
-  report.signer->key = {"RSA", 2048, std::string(64, 'a'), std::string(64, 'b'), ""};
+  report.signer->key = {"RSA", 2048, std::string(64, 'a'), std::string(64, 'b')};
+  report.key = {std::string(64, 'b'), 2048, true};
   const std::string page = PageOf(report);
   for (const char* part :
        {"<p>1 file: 1 partly signed</p>", "<p class=\"verdict mixed\">PARTLY SIGNED</p>",
@@ -232,13 +232,30 @@ TEST(Page, TellsSchemesOfOneCertificateTogether) {
   EXPECT_TRUE(Has(page, "<h4>Signed with v3</h4>"));
 }
 
-TEST(Page, SaysOfTheJarSignerAloneThatTheKernelGetsTheKey) {
-  Report report = Example(Verdict::kRefused);
+TEST(Page, SaysOfTheJarSignerAloneWhatTheKernelGot) {
+  Report report = Example(Verdict::kSigned);
   CertificateFacts certificate;
   certificate.key.modulus_sha256 = std::string(64, '0');
   report.newer = {{"v2", certificate}};
-  report.signer.reset();
   EXPECT_TRUE(Has(PageOf(report), "0 (of the modulus alone)</dd>"));
   report.signer = certificate;
-  EXPECT_TRUE(Has(PageOf(report), "0 (of the modulus alone: what the kernel gets)</dd>"));
+  report.key = {std::string(64, '1'), 2048, true};
+  const std::string page = PageOf(report);
+  EXPECT_TRUE(Has(page, "1 (of the modulus alone: what the kernel got)</dd>"));
+  EXPECT_FALSE(Has(page, "0 (of the modulus alone"));
+}
+
+TEST(Page, HasTheAlarmsBelowTheFile) {
+  Report report = Example(Verdict::kSigned);
+  report.warnings = {{&cause::kOtherPackageName, "\"com.evil\""}};
+  EXPECT_TRUE(Has(PageOf(report), "<p class=\"fact\">! phones install it as &quot;com.evil&quot;"));
+}
+
+// A name that is too long is cut before the key, and not the key for its sake.
+TEST(Page, ShowsTheKeyBehindALongName) {
+  Report report = Example(Verdict::kSigned);
+  report.signer.emplace();
+  report.signer->subject = std::string(1000, 'n');
+  report.key = {std::string(64, '1'), 2048, true};
+  EXPECT_TRUE(Has(PageOf(report), "n…, RSA-2048, key 11111111…111111</p>"));
 }

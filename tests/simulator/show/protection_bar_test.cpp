@@ -8,28 +8,28 @@ using namespace simulator;
 
 namespace {
 
-std::vector<double> Percents(const std::vector<BarPart>& parts) {
+std::vector<double> Percents(const std::vector<DrawnPart>& parts) {
   std::vector<double> percents;
-  for (const BarPart& part : parts) percents.push_back(part.percent);
+  for (const DrawnPart& part : parts) percents.push_back(part.percent);
   return percents;
 }
 
 }  // namespace
 
 // 1000 bytes, of which 100 lie between the entries.
-TEST(ShareBar, HasEachPartAndWhatLiesBetweenTheEntries) {
-  const auto parts = MakeShareBar({{1, 400}, {2, 300}, {3, 150}, {4, 50}, {}}, 1000);
+TEST(DrawnBar, HasEachPartAndWhatLiesBetweenTheEntries) {
+  const auto parts = DrawBar({{1, 400}, {2, 300}, {3, 150}, {4, 50}, {}}, 1000);
   EXPECT_EQ(Percents(parts), std::vector<double>({40, 30, 15, 5, 10}));
   EXPECT_EQ(parts[4].share.bytes, 100U);
   EXPECT_FALSE(parts[4].has_entries);
 }
 
 // Five parts of at least 0.75 leave 96.25 to divide: half of it, and 0.75, is 48.875.
-TEST(ShareBar, IsAsWideAsItMayBeAndShowsTheLeastByte) {
-  const auto parts = MakeShareBar({{1, 500'000}, {1, 499'000}, {1, 1}, {1, 499}, {}}, 1'000'000);
+TEST(DrawnBar, IsAsWideAsItMayBeAndShowsTheLeastByte) {
+  const auto parts = DrawBar({{1, 500'000}, {1, 499'000}, {1, 1}, {1, 499}, {}}, 1'000'000);
   EXPECT_DOUBLE_EQ(parts[0].width, 48.875);
   double end = 0;
-  for (const BarPart& part : parts) {
+  for (const DrawnPart& part : parts) {
     EXPECT_DOUBLE_EQ(part.start, end);
     EXPECT_GE(part.width, 0.75);
     end = part.start + part.width;
@@ -37,8 +37,8 @@ TEST(ShareBar, IsAsWideAsItMayBeAndShowsTheLeastByte) {
   EXPECT_NEAR(end, 100, 1e-9);
 }
 
-TEST(ShareBar, DrawsNothingOfWhatIsNotThere) {
-  const auto parts = MakeShareBar({{}, {1, 1000}, {}, {}, {}}, 1000);
+TEST(DrawnBar, DrawsNothingOfWhatIsNotThere) {
+  const auto parts = DrawBar({{}, {1, 1000}, {}, {}, {}}, 1000);
   EXPECT_EQ(Percents(parts), std::vector<double>({0, 100, 0, 0, 0}));
   EXPECT_EQ(parts[0].width, 0);
   EXPECT_EQ(parts[1].start, 0);
@@ -46,13 +46,13 @@ TEST(ShareBar, DrawsNothingOfWhatIsNotThere) {
 }
 
 // As in an archive whose entries share their bytes.
-TEST(ShareBar, TakesMoreBytesThanTheFileHas) {
-  const auto parts = MakeShareBar({{1, UINT64_MAX}, {1, UINT64_MAX}, {}, {}, {}}, 1000);
+TEST(DrawnBar, TakesMoreBytesThanTheFileHas) {
+  const auto parts = DrawBar({{1, UINT64_MAX}, {1, UINT64_MAX}, {}, {}, {}}, 1000);
   EXPECT_EQ(Percents(parts), std::vector<double>({50, 50, 0, 0, 0}));
 }
 
-TEST(ShareBar, OfNoEntriesIsNone) {
-  EXPECT_TRUE(MakeShareBar({}, 1000).empty());
-  const auto empty = MakeShareBar({{1, 0}, {}, {}, {}, {}}, 0);
+TEST(DrawnBar, OfNoEntriesIsNone) {
+  EXPECT_TRUE(DrawBar({}, 1000).empty());
+  const auto empty = DrawBar({{1, 0}, {}, {}, {}, {}}, 0);
   EXPECT_EQ(Percents(empty), std::vector<double>({0, 0, 0, 0, 0}));
 }

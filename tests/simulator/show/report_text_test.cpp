@@ -83,6 +83,7 @@ TEST(ReportText, SignerStandsAsApksignerPrintsIt) {
   Report report = Example();
   report.items.clear();
   report.signer = Signer();
+  report.key = {report.signer->key.modulus_sha256, 2048, true};
   report.schemes = {"v1", "v2"};
   report.protection.verified = {2, 100};
   report.protection.unlisted = {1, 1};
@@ -102,7 +103,7 @@ TEST(ReportText, SignerStandsAsApksignerPrintsIt) {
                 "    modulus SHA-256 digest: 98302ce8" +
                 std::string(50, '0') +
                 "f64646"
-                " (of the modulus alone: what the kernel gets)\n"
+                " (of the modulus alone: what the kernel got)\n"
                 "    schemes: v1, v2\n"
                 "    protects: 2 entries (100 bytes) verified, 0 entries (0 bytes) listed and not "
                 "verified, 1 entry (1 byte) not listed\n");
@@ -118,6 +119,7 @@ TEST(ReportText, VerboseNamesWhatIsNotListedAndTheChain) {
   report.items.clear();
   report.protection.unlisted_names = {"assets/a", "odd\nname"};
   report.signer = Signer();
+  report.key = {report.signer->key.modulus_sha256, 2048, true};
   report.newer = {{"v2", Signer()}};
   report.chain = {{"key", LinkState::kHolds, "RSA-2048"},
                   {"certificate", LinkState::kBroken, "why"},

@@ -120,3 +120,8 @@ TEST(Timeline, UnknownEventIsShownAsItStands) {
   EXPECT_EQ(LinesOf(Printed(kStart + "{\"event\":\"later\",\"a\":1}\n" + kExit))[0],
             "   1  later      {\"a\":1,\"event\":\"later\"}");
 }
+
+TEST(Timeline, UnknownEventIsNotObeyedEither) {
+  EXPECT_EQ(LinesOf(Printed(kStart + "{\"event\":\"\\u001b\\uf7e9\"}\n" + kExit))[0],
+            "   1  \\x1b\\xe9   {\"event\":\"\\u001b\uf7e9\"}");
+}

@@ -38,47 +38,57 @@ Report WholeReport() {
   report.signer.emplace();
   report.signer->subject = "CN=a";
   report.signer->sha256 = "11";
-  report.signer->key = {"RSA", 2048, "22", "33", ""};
+  report.signer->key = {"RSA", 2048, "22", "33"};
   report.newer = {{"v2", *report.signer}};
-  report.newer[0].certificate.key = {"EC", 256, "44", "", ""};
+  report.newer[0].certificate.key = {"EC", 256, "44", ""};
+  report.newer.push_back({"v3", *report.signer});
+  report.payload = "2000ab";
+  report.key = {"ab", 2048, true};
   report.protection.verified = {1, 2};
-  report.chain = {{"key", LinkState::kHolds, "RSA-2048"}, {"entries", LinkState::kBroken, "x"}};
-
+  report.protection.vouched = {3, 4};
+  report.protection.unlisted = {5, 6};
+  report.protection.signature = {7, 8};
+  report.chain = {{"key", LinkState::kHolds, "RSA-2048"},
+                  {"entries", LinkState::kBroken, "x"},
+                  {"manifest", LinkState::kNotReached, "y"}};
   return report;
 }
 
 }  // namespace
 
+// Compared as a whole, so that no member is added, lost or taken from another one unnoticed.
 TEST(VerdictEvent, HoldsTheWholeReport) {
   const Json event = ParseJournal(VerdictEvent(WholeReport())).at(0);
-  EXPECT_EQ(event["event"], "verdict");
-  EXPECT_EQ(event["file"], "base.apk");
-  EXPECT_EQ(event["path"], "/data/app/od\uf7e9\".apk");
-  EXPECT_EQ(event["verdict"], "partly-signed");
-  EXPECT_EQ(event["status"], 1);
-  EXPECT_EQ(event["package"], "com.app");
-  EXPECT_EQ(event["items"], Json::parse(R"json([
-    {"kind": "package", "name": "package", "state": "signed"},
-    {"kind": "library", "name": "lib/arm64/a.so", "entry": "lib/arm64-v8a/a.so",
-     "state": "refused", "reason": "kernel-refused", "text": "the kernel refused (EPERM)"},
-    {"kind": "library", "name": "lib/arm/a.so", "entry": "lib/armeabi/a.so", "state": "absent",
-     "reason": "library-missing",
-     "text": "it does not lie beside the package, where others are"},
-    {"kind": "library", "name": "lib/x86/a.so", "entry": "lib/x86/a.so",
-     "state": "nothing-to-sign", "reason": "library-other-abi",
-     "text": "no phone of this kind installs it"},
-    {"kind": "key", "name": "com.app", "state": "registered"}])json"));
-  EXPECT_EQ(event["warnings"], Json::parse(R"([{"reason": "signing-block-damaged",
-    "text": "the block of the schemes after v1 does not read"}])"));
-  EXPECT_EQ(event["signers"], Json::parse(R"([
-    {"scheme": "v1", "subject": "CN=a", "certificate_sha256": "11", "key_algorithm": "RSA",
-     "key_bits": 2048, "key_sha256": "22", "modulus_sha256": "33"},
-    {"scheme": "v2", "subject": "CN=a", "certificate_sha256": "11", "key_algorithm": "EC",
-     "key_bits": 256, "key_sha256": "44"}])"));
-  EXPECT_EQ(event["protection"]["verified"], Json::parse(R"({"entries": 1, "bytes": 2})"));
-  EXPECT_EQ(event["chain"], Json::parse(R"([
-    {"link": "key", "state": "holds", "text": "RSA-2048"},
-    {"link": "entries", "state": "broken", "text": "x"}])"));
+  EXPECT_EQ(event, Json::parse(R"json({
+    "event": "verdict", "file": "base.apk", "path": "/data/app/od\uf7e9\".apk",
+    "verdict": "partly-signed", "status": 1, "package": "com.app", "payload": "2000ab",
+    "items": [
+      {"kind": "package", "name": "package", "state": "signed"},
+      {"kind": "library", "name": "lib/arm64/a.so", "entry": "lib/arm64-v8a/a.so",
+       "state": "refused", "reason": "kernel-refused", "text": "the kernel refused (EPERM)"},
+      {"kind": "library", "name": "lib/arm/a.so", "entry": "lib/armeabi/a.so", "state": "absent",
+       "reason": "library-missing",
+       "text": "it does not lie beside the package, where others are"},
+      {"kind": "library", "name": "lib/x86/a.so", "entry": "lib/x86/a.so",
+       "state": "nothing-to-sign", "reason": "library-other-abi",
+       "text": "no phone of this kind installs it"},
+      {"kind": "key", "name": "com.app", "state": "registered"}],
+    "warnings": [{"reason": "signing-block-damaged",
+                  "text": "the block of the schemes after v1 does not read"}],
+    "signers": [
+      {"scheme": "v1", "subject": "CN=a", "certificate_sha256": "11", "key_algorithm": "RSA",
+       "key_bits": 2048, "key_sha256": "22", "modulus_sha256": "ab"},
+      {"scheme": "v2", "subject": "CN=a", "certificate_sha256": "11", "key_algorithm": "EC",
+       "key_bits": 256, "key_sha256": "44"},
+      {"scheme": "v3", "subject": "CN=a", "certificate_sha256": "11", "key_algorithm": "RSA",
+       "key_bits": 2048, "key_sha256": "22", "modulus_sha256": "33"}],
+    "protection": {
+      "verified": {"entries": 1, "bytes": 2}, "vouched": {"entries": 3, "bytes": 4},
+      "unlisted": {"entries": 5, "bytes": 6}, "signature": {"entries": 7, "bytes": 8}},
+    "chain": [
+      {"link": "key", "state": "holds", "text": "RSA-2048"},
+      {"link": "entries", "state": "broken", "text": "x"},
+      {"link": "manifest", "state": "not-reached", "text": "y"}]})json"));
 }
 
 TEST(VerdictEvent, IsOneLine) {
@@ -88,11 +98,56 @@ TEST(VerdictEvent, IsOneLine) {
   EXPECT_EQ(line.find('\n'), line.size() - 1);
 }
 
-TEST(VerdictEvent, EveryVerdictHasACode) {
-  EXPECT_STREQ(CodeOf(Verdict::kSigned), "signed");
-  EXPECT_STREQ(CodeOf(Verdict::kRefused), "refused");
-  EXPECT_STREQ(CodeOf(Verdict::kTrustedJar), "trusted-jar");
-  EXPECT_STREQ(CodeOf(Verdict::kNotTrustedJar), "not-trusted-jar");
-  EXPECT_STREQ(CodeOf(Verdict::kNotLookedAt), "not-looked-at");
-  EXPECT_STREQ(CodeOf(Verdict::kNotSimulated), "not-simulated");
+TEST(VerdictEvent, EveryVerdictHasACodeAndAStatus) {
+  const auto code = [](Verdict verdict) {
+    Report report;
+    report.verdict = verdict;
+    const Json event = ParseJournal(VerdictEvent(report)).at(0);
+    return event["verdict"].get<std::string>() + " " + event["status"].dump();
+  };
+  EXPECT_EQ(code(Verdict::kSigned), "signed 0");
+  EXPECT_EQ(code(Verdict::kTrustedJar), "trusted-jar 0");
+  EXPECT_EQ(code(Verdict::kPartlySigned), "partly-signed 1");
+  EXPECT_EQ(code(Verdict::kRefused), "refused 1");
+  EXPECT_EQ(code(Verdict::kNotTrustedJar), "not-trusted-jar 1");
+  EXPECT_EQ(code(Verdict::kNotLookedAt), "not-looked-at 4");
+  EXPECT_EQ(code(Verdict::kNotSimulated), "not-simulated 3");
+}
+
+TEST(VerdictEvent, EveryKindAndStateHasACode) {
+  const auto item = [](ItemKind kind, ItemState state) {
+    Report report;
+    report.items = {{kind, "", "", state, {}}};
+    const Json made = ParseJournal(VerdictEvent(report)).at(0)["items"][0];
+    return made["kind"].get<std::string>() + " " + made["state"].get<std::string>();
+  };
+  EXPECT_EQ(item(ItemKind::kPackage, ItemState::kDone), "package signed");
+  EXPECT_EQ(item(ItemKind::kJar, ItemState::kRefused), "jar refused");
+  EXPECT_EQ(item(ItemKind::kFile, ItemState::kRefused), "file refused");
+  EXPECT_EQ(item(ItemKind::kEntries, ItemState::kRefused), "entries refused");
+  EXPECT_EQ(item(ItemKind::kLibrary, ItemState::kAbsent), "library absent");
+  EXPECT_EQ(item(ItemKind::kKey, ItemState::kDone), "key registered");
+  EXPECT_EQ(item(ItemKind::kTool, ItemState::kNothing), "tool nothing-to-sign");
+}
+
+TEST(VerdictEvent, EveryStateOfALinkHasACode) {
+  Report report;
+  report.chain = {{"a", LinkState::kHolds, ""},
+                  {"b", LinkState::kBroken, ""},
+                  {"c", LinkState::kNotReached, ""}};
+  const Json chain = ParseJournal(VerdictEvent(report)).at(0)["chain"];
+  EXPECT_EQ(chain[0]["state"], "holds");
+  EXPECT_EQ(chain[1]["state"], "broken");
+  EXPECT_EQ(chain[2]["state"], "not-reached");
+}
+
+// Of the JAR signature it is the key that the kernel got, whatever the certificate shows.
+TEST(VerdictEvent, KeyThatNoCertificateShowsIsTold) {
+  Report report;
+  report.key = {"ab", 2048, true};
+  const Json signers = ParseJournal(VerdictEvent(report)).at(0)["signers"];
+  ASSERT_EQ(signers.size(), 1U);
+  EXPECT_EQ(signers[0]["scheme"], "v1");
+  EXPECT_EQ(signers[0]["modulus_sha256"], "ab");
+  EXPECT_EQ(signers[0]["subject"], "");
 }

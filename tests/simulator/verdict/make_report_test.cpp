@@ -4,6 +4,8 @@
 
 #include <cerrno>
 
+#include "apk/native_libraries.h"
+
 #include "simulator/phone/probe_run.h"
 
 using namespace simulator;
@@ -79,9 +81,13 @@ Json CannotSign(int error) {
   return Log(6, "VELT can't sign a file (result=10000, errno " + std::to_string(error) + ": x).\n");
 }
 
-PackageFacts WithLibraries(const Lines& entries) {
+// What can be seen of a package with these libraries, each as opening it ends.
+PackageFacts WithLibraries(const Lines& entries, int error = 0, bool has_directory = false) {
   PackageFacts facts;
-  for (const std::string& name : entries) facts.libraries.push_back({name, 1, 1, false});
+  for (const std::string& name : entries) {
+    const std::string place = ApkTools::InstalledLibraryPath("", name);
+    facts.libraries.push_back({name, place, true, error, has_directory});
+  }
   return facts;
 }
 
@@ -98,9 +104,9 @@ TEST(MakeReport, GoodPackage) {
 }
 
 TEST(MakeReport, TrustedJarIsGoodWhateverItLacksOfAPackage) {
-  const Report report =
-      Made({Log(6, "Can't extract Android Manifest: Entry not found\n"), kLibrariesStart,
-            Log(6, "VeltSignJni: malformed apk: /a\n"), Verify(0), Sign(kFile, kNoData)});
+  const Report report = Made({Log(6, "Can't extract Android Manifest: Entry not found\n"),
+                              kLibrariesStart, Log(6, "VeltSignJni: malformed apk: /a\n"),
+                              kFileStart, Verify(0), Sign(kFile, kNoData)});
   EXPECT_EQ(report.verdict, Verdict::kTrustedJar);
   EXPECT_EQ(ItemsOf(report), Lines({"JAR done"}));
 }
@@ -141,45 +147,104 @@ TEST(MakeReport, LibraryWithOtherBytesIsRefused) {
             Lines({"package done", "lib/arm64/libfoo.so refused library-changed"}));
 }
 
-struct LibraryRow {
-  const char* error;
-  const char* item;
-};
-
-TEST(MakeReport, LinesBeforeALibraryWasNotVerifiedSayWhy) {
-  const std::vector<LibraryRow> rows = {
-      {"Can't read file: x (streamoff=-1)\n", "refused library-no-file"},
-      {"Can't find file in META-INF/MANIFEST.MF: x\n", "refused library-not-listed"},
-      {"verifyData: Unsupported digest type: MD5-Digest\n", "refused library-digest"},
-      // Nothing lies at /data on a workstation.
-      {"Can't open file: x\n", "absent library-not-installed"},
-  };
-  for (const LibraryRow& row : rows) {
-    EXPECT_EQ(Items({kLibrariesStart, Log(6, row.error),
-                     Log(6, "VeltSignJni: File not verified: " + kLibrary + "\n"), kFileStart,
-                     Sign(kFile, kPackagePayload)}),
-              Lines({"package done", std::string("lib/arm64/libfoo.so ") + row.item}));
-  }
+// The library's item where this is logged of it, and opening it ends like this.
+std::string LibraryItem(const std::string& error, int opening = 0, bool has_directory = false,
+                        const JudgeOptions& options = {}) {
+  const Report report = Made(
+      {kLibrariesStart, Log(6, error), Log(6, "VeltSignJni: File not verified: " + kLibrary + "\n"),
+       kFileStart, Sign(kFile, kPackagePayload)},
+      WithLibraries({"lib/arm64-v8a/libfoo.so"}, opening, has_directory), options);
+  const Verdict expected =
+      report.items[1].state == ItemState::kRefused ? Verdict::kPartlySigned : Verdict::kSigned;
+  EXPECT_EQ(report.verdict, expected);
+  return ItemsOf(report)[1];
 }
 
-TEST(MakeReport, LibraryThatIsNotThereIsNoRefusalUnlessTheUserIsStrict) {
-  const Events events = {kLibrariesStart, Log(6, "Can't open file: x\n"),
-                         Log(6, "VeltSignJni: File not verified: " + kLibrary + "\n"), kFileStart,
-                         Sign(kFile, kPackagePayload)};
-  EXPECT_EQ(Made(events).verdict, Verdict::kSigned);
-  const Report report = Made(events, {}, {true});
-  EXPECT_EQ(report.verdict, Verdict::kPartlySigned);
-  EXPECT_EQ(ItemsOf(report)[1], "lib/arm64/libfoo.so refused library-not-installed");
+TEST(MakeReport, LinesBeforeALibraryWasNotVerifiedSayWhy) {
+  EXPECT_EQ(LibraryItem("Can't read file: x (streamoff=-1)\n"),
+            "lib/arm64/libfoo.so refused library-no-file");
+  EXPECT_EQ(LibraryItem("Can't find file in META-INF/MANIFEST.MF: x\n"),
+            "lib/arm64/libfoo.so refused library-not-listed");
+  EXPECT_EQ(LibraryItem("verifyData: Unsupported digest type: MD5-Digest\n"),
+            "lib/arm64/libfoo.so refused library-digest");
+}
+
+TEST(MakeReport, LibraryThatDoesNotOpenIsRefusedUnlessItIsNotThere) {
+  const auto item = [](int error, bool has_directory) {
+    return LibraryItem("Can't open file: x\n", error, has_directory).substr(20);
+  };
+  EXPECT_EQ(item(ENOENT, false), "absent library-not-installed");
+  EXPECT_EQ(item(ENOENT, true), "absent library-missing");
+  EXPECT_EQ(item(ENOTDIR, false), "absent library-not-installed");
+  EXPECT_EQ(item(EACCES, true), "refused library-no-permission");
+  EXPECT_EQ(item(EPERM, true), "refused library-no-permission");
+  EXPECT_EQ(item(EWOULDBLOCK, true), "refused library-leased");
+  EXPECT_EQ(item(ELOOP, true),
+            "refused library-not-opened ELOOP: Too many levels of symbolic links");
+  EXPECT_EQ(item(0, true), "refused library-not-opened why is not known");
+}
+
+TEST(MakeReport, LibraryThatIsNotThereIsRefusedWhereTheUserIsStrict) {
+  EXPECT_EQ(LibraryItem("Can't open file: x\n", ENOENT, false, {true}),
+            "lib/arm64/libfoo.so refused library-not-installed");
+  EXPECT_EQ(LibraryItem("Can't open file: x\n", ENOENT, true, {true}),
+            "lib/arm64/libfoo.so refused library-missing");
 }
 
 TEST(MakeReport, LibraryThatThePackageKeepsIsToldApart) {
-  PackageFacts facts = WithLibraries({"lib/arm64-v8a/libfoo.so"});
+  PackageFacts facts = WithLibraries({"lib/arm64-v8a/libfoo.so"}, ENOENT);
   facts.manifest.extracts_libraries = false;
   EXPECT_EQ(Items({kLibrariesStart, Log(6, "Can't open file: x\n"),
                    Log(6, "VeltSignJni: File not verified: " + kLibrary + "\n"), kFileStart,
                    Sign(kFile, kPackagePayload)},
                   facts)[1],
             "lib/arm64/libfoo.so absent library-in-package");
+}
+
+// The tool's walk ends there, and what comes after is not signed however good it is.
+TEST(MakeReport, LibraryBehindADamagedEntryIsRefusedIfItLiesThere) {
+  const auto items = [](int error, bool is_strict) {
+    PackageFacts facts =
+        WithLibraries({"lib/arm64-v8a/liba.so", "lib/arm64-v8a/libb.so", "lib/x86/libc.so"}, error);
+    for (LibraryFacts& library : facts.libraries) library.is_met = false;
+    facts.libraries[0].is_met = true;
+    facts.libraries[0].error = 0;
+    return ItemsOf(Made({kLibrariesStart, kTakesUp, Integrity("1f"),
+                         Sign("/data/app/lib/arm64/liba.so", kPackagePayload), kFileStart,
+                         Sign(kFile, kPackagePayload)},
+                        facts, {is_strict}));
+  };
+  EXPECT_EQ(items(0, false), Lines({"package done", "lib/arm64/liba.so done",
+                                    "lib/arm64/libb.so refused library-behind-damage",
+                                    "lib/x86/libc.so nothing library-other-abi"}));
+  EXPECT_EQ(items(ENOENT, false)[2], "lib/arm64/libb.so absent library-not-installed");
+  EXPECT_EQ(items(ENOENT, true)[2], "lib/arm64/libb.so refused library-not-installed");
+}
+
+TEST(MakeReport, LibraryThatCannotBeLaidOutIsRefused) {
+  RunRecord record = Record({kLibrariesStart, Log(6, "Can't open file: x\n"),
+                             Log(6, "VeltSignJni: File not verified: " + kLibrary + "\n"),
+                             kFileStart, Sign(kFile, kPackagePayload)});
+  record.not_extracted = {"lib/arm64-v8a/libfoo.so"};
+  const Report report =
+      MakeReport(record, WithLibraries({"lib/arm64-v8a/libfoo.so"}, ENOENT, true), {});
+  EXPECT_EQ(report.verdict, Verdict::kPartlySigned);
+  EXPECT_EQ(ItemsOf(report)[1], "lib/arm64/libfoo.so refused library-not-extracted");
+}
+
+TEST(MakeReport, DamagedEntriesAreADoubtAndForTheStrictARefusal) {
+  PackageFacts facts;
+  facts.entries = {{{"res/a", 1, true}, true, false}, {{"res/b", 1, true}, true, false}};
+  const Report report = Made({Sign(kFile, kPackagePayload)}, facts);
+  EXPECT_EQ(report.verdict, Verdict::kSigned);
+  ASSERT_EQ(report.warnings.size(), 1U);
+  EXPECT_EQ(report.warnings[0].Text(),
+            "the archive is damaged at 2 entries: res/a, ..., which nobody can read");
+  const Report strict = Made({Sign(kFile, kPackagePayload)}, facts, {true});
+  EXPECT_EQ(strict.verdict, Verdict::kPartlySigned);
+  EXPECT_TRUE(strict.warnings.empty());
+  EXPECT_EQ(ItemsOf(strict),
+            Lines({"package done", "entries refused entries-damaged 2 entries: res/a, ..."}));
 }
 
 TEST(MakeReport, LibraryThatVanishedIsRefused) {
@@ -233,6 +298,20 @@ TEST(MakeReport, IntegrityValuesAreReadAsTheToolReadsThem) {
   EXPECT_EQ(reason("none"), "package refused integrity-unreadable none");
   EXPECT_EQ(reason(""), "package refused integrity-unreadable");
   EXPECT_EQ(reason(nullptr), "package refused integrity-missing");
+}
+
+// Of one file as well, and of a library whose path nobody told.
+TEST(MakeReport, EachAnswerOfTheKernelCounts) {
+  const std::string refused = "kernel-refused EPERM: Operation not permitted";
+  EXPECT_EQ(Items({kFileStart, kTakesUp, Sign(kFile, kPackagePayload, EPERM),
+                   Sign(kFile, kPackagePayload)}),
+            Lines({"package refused " + refused, "base.apk done"}));
+  EXPECT_EQ(Items({kFileStart, kTakesUp, Sign(kFile, kPackagePayload),
+                   Sign(kFile, kPackagePayload, EPERM)}),
+            Lines({"package done", "base.apk refused " + refused}));
+  EXPECT_EQ(Items({kLibrariesStart, kTakesUp, Sign("", kPackagePayload, EPERM), CannotSign(EPERM),
+                   kFileStart, kTakesUp, Sign(kFile, kPackagePayload)}),
+            Lines({"package done", " refused " + refused}));
 }
 
 TEST(MakeReport, KernelRefusalsNameTheError) {
@@ -292,6 +371,9 @@ TEST(MakeReport, FileThatTheToolDidNotLookAt) {
   };
   EXPECT_EQ(item(ENOENT, false, true), "file refused file-missing");
   EXPECT_EQ(item(EACCES, false, true), "file refused file-no-permission");
+  EXPECT_EQ(item(EPERM, false, true), "file refused file-no-permission");
+  EXPECT_EQ(item(EWOULDBLOCK, false, true), "file refused file-leased");
+  EXPECT_EQ(item(ENOTDIR, false, true), "file refused file-not-opened ENOTDIR: Not a directory");
   EXPECT_EQ(item(ELOOP, false, true),
             "file refused file-not-opened ELOOP: Too many levels of symbolic links");
   EXPECT_EQ(item(0, true, true), "file refused read-only-file-system");
@@ -315,6 +397,25 @@ TEST(MakeReport, FailureOfTheSimulationIsNoVerdictOnTheFile) {
   const Report report = MakeReport(record, {}, {});
   EXPECT_EQ(report.verdict, Verdict::kNotSimulated);
   EXPECT_EQ(report.items[0].reason.Text(), "it was still busy after 2 seconds and was stopped");
+  record.failure = {Failure::Kind::kInterrupted, ""};
+  EXPECT_EQ(MakeReport(record, {}, {}).items[0].reason.Text(), "it was interrupted");
+}
+
+TEST(MakeReport, EachFailureHasItsCause) {
+  const std::vector<std::pair<Failure::Kind, const Cause*>> rows = {
+      {Failure::Kind::kNotStarted, &cause::kToolNotStarted},
+      {Failure::Kind::kTimedOut, &cause::kToolTimedOut},
+      {Failure::Kind::kInterrupted, &cause::kInterrupted},
+      {Failure::Kind::kStandInsMissing, &cause::kStandInsMissing},
+      {Failure::Kind::kStateNotKept, &cause::kStateNotKept},
+      {Failure::Kind::kNotInstalled, &cause::kNotInstalled}};
+  for (const auto& [kind, why] : rows) {
+    RunRecord record = Record({Sign(kFile, kPackagePayload)});
+    record.failure = {kind, "x"};
+    const Report report = MakeReport(record, {}, {});
+    EXPECT_EQ(report.verdict, Verdict::kNotSimulated);
+    EXPECT_EQ(report.items[0].reason.cause, why);
+  }
 }
 
 TEST(MakeReport, EachVerdictHasItsStatus) {

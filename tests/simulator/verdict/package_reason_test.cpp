@@ -1,4 +1,4 @@
-#include "simulator/verdict/package_reason.h"
+#include "simulator/verdict/parts.h"
 
 #include <gtest/gtest.h>
 
@@ -8,9 +8,14 @@ using namespace simulator;
 
 namespace {
 
+// Each with a line end, unless it is one of those that the tool logs without.
 RunRecord After(const Lines& errors) {
   RunRecord run;
-  run.opening_errors = errors;
+  for (const std::string& error : errors) {
+    const LogLine whole = ReadLogLine(error);
+    const bool is_known = whole.meaning != LogMeaning::kUnknown;
+    run.opening_errors.push_back(is_known ? whole : ReadLogLine(error + "\n"));
+  }
   return run;
 }
 
@@ -28,23 +33,19 @@ PackageFacts Signed() {
   PackageFacts facts;
   facts.kind = FileKind::kArchive;
   facts.archive_result = 0;
-  facts.jar.has_manifest = facts.jar.can_read_manifest = facts.jar.has_manifest_digest = true;
+  facts.jar.manifest = Archive::ReadResult::kRead;
+  facts.jar.has_manifest_digest = facts.jar.has_block = true;
   facts.jar.signature_files = {"META-INF/CERT.SF"};
   facts.jar.block_name = "META-INF/CERT.RSA";
-  facts.jar.block_is_whole = true;
-  facts.jar.digest = "SHA-256";
+  facts.jar.block.is_whole = facts.jar.block.has_known_digest = true;
+  facts.jar.block.digest = "SHA256";
   facts.jar.certificate.emplace();
   facts.jar.certificate->is_self_issued = true;
   facts.jar.certificate->signature_algorithm = "SHA256withRSA";
+  facts.jar.certificate->has_known_digest = true;
   facts.jar.certificate->key.algorithm = "RSA";
   facts.jar.certificate->key.bits = 2048;
-  facts.jar.certificate->key.exponent = std::string("\1\0\1", 3);
-  return facts;
-}
-
-PackageFacts WithExponent(const std::string& exponent) {
-  PackageFacts facts = Signed();
-  facts.jar.certificate->key.exponent = exponent;
+  facts.jar.key = ToolKey{"", 256, 2048, 65537, false};
   return facts;
 }
 
@@ -54,9 +55,9 @@ TEST(WhyRefused, OfADexFileTheLinesBeforeItTell) {
   RunRecord run;
   run.is_dex_refused = true;
   EXPECT_EQ(Code(WhyRefused(run, Signed())), "dex-changed");
-  run.dex_errors = {"Can't find file in META-INF/MANIFEST.MF: classes.dex"};
+  run.dex_why = LogMeaning::kNotListed;
   EXPECT_EQ(Code(WhyRefused(run, Signed())), "dex-not-listed");
-  run.dex_errors = {"verifyData: Unsupported digest type: MD5-Digest"};
+  run.dex_why = LogMeaning::kDigestUnknown;
   EXPECT_EQ(Code(WhyRefused(run, Signed())), "dex-digest");
 }
 
@@ -66,7 +67,7 @@ TEST(WhyRefused, OfWhatTheZipLibraryDoesNotOpenTheKindOfFileTells) {
     facts.kind = kind;
     return Why({"OpenArchiveFd(3) [file: a] returned: -3: Invalid file"}, facts);
   };
-  EXPECT_EQ(why(FileKind::kFolder), "folder");
+  EXPECT_EQ(why(FileKind::kDirectory), "folder");
   EXPECT_EQ(why(FileKind::kSpecial), "special-file");
   EXPECT_EQ(why(FileKind::kEmpty), "empty-file");
   EXPECT_EQ(why(FileKind::kText), "text-file");
@@ -81,8 +82,9 @@ TEST(WhyRefused, WithoutARsaBlockTheOneThatIsThereTells) {
   const Lines errors = {"Can't extract RSA certificate: META-INF/CERT.RSA"};
   PackageFacts facts = Signed();
   EXPECT_EQ(Why(errors, facts), "signature-block-unreadable META-INF/CERT.RSA");
-  facts.jar.block_name = "";
+  facts.jar.has_block = false;
   EXPECT_EQ(Why(errors, facts), "signature-block-missing META-INF/CERT.RSA");
+  facts.jar.has_block = true;
   facts.jar.block_name = "META-INF/CERT.EC";
   EXPECT_EQ(Why(errors, facts), "ec-key");
   facts.jar.block_name = "META-INF/CERT.DSA";
@@ -98,14 +100,16 @@ TEST(WhyRefused, BlockThatDoesNotParseMayBeOfAnotherKey) {
   EXPECT_EQ(Why(errors, facts), "ec-key");
 }
 
-// The tool takes the exponent's first four bytes for a number with the lowest byte first.
 TEST(WhyRefused, KeyThatCannotBeSetHasAnExponentThatIsReadAsOne) {
   const Lines errors = {"RSA could not set key: 5", "file not verified: META-INF/CERT.SF"};
-  EXPECT_EQ(Why(errors, WithExponent("\1")), "exponent-refused 1");
-  EXPECT_EQ(Why(errors, WithExponent(std::string("\1\0\0\0", 4))),
-            "exponent-refused 0x01000000, which is read as 1");
-  EXPECT_EQ(Why(errors, WithExponent("\xff\xff\xff\xff")),
-            "exponent-refused 0xffffffff, which is read as 1");
+  const auto why = [&errors](int32_t exponent) {
+    PackageFacts facts = Signed();
+    facts.jar.key->exponent = exponent;
+    facts.jar.key->is_forgeable = true;
+    return Why(errors, facts);
+  };
+  EXPECT_EQ(why(1), "exponent-refused 1");
+  EXPECT_EQ(why(-1), "exponent-refused -1");
   EXPECT_EQ(Why(errors, Signed()), "signature-block-malformed META-INF/CERT.RSA");
   EXPECT_EQ(Why({"RSA could not set key: 9"}, Signed()), "no-memory");
 }
@@ -115,14 +119,21 @@ TEST(WhyRefused, OfACertificate) {
   PackageFacts facts = Signed();
   EXPECT_EQ(Why(errors, facts), "certificate-changed");
   facts.jar.certificate->signature_algorithm = "SHA384withRSA";
+  facts.jar.certificate->has_known_digest = false;
   EXPECT_EQ(Why(errors, facts), "certificate-digest SHA384withRSA");
   facts.jar.certificate->is_self_issued = false;
   facts.jar.certificate->issuer = "CN=Authority";
   EXPECT_EQ(Why(errors, facts), "certificate-issued CN=Authority");
-  facts.jar.certificate->key.bits = 4097;
-  EXPECT_EQ(Why(errors, facts), "key-too-large 4097");
-  facts.jar.certificate->key.bits = 127;
-  EXPECT_EQ(Why(errors, facts), "key-too-small 127");
+  // The largest and the smallest key that the tool takes, in bytes, and what is beyond.
+  const auto of_size = [&](uint32_t size) {
+    facts.jar.key->size = size;
+    facts.jar.key->bits = static_cast<int>(size) * 8 - 1;
+    return Why(errors, facts);
+  };
+  EXPECT_EQ(of_size(512), "certificate-issued CN=Authority");
+  EXPECT_EQ(of_size(513), "key-too-large 4103");
+  EXPECT_EQ(of_size(16), "certificate-issued CN=Authority");
+  EXPECT_EQ(of_size(15), "key-too-small 119");
   EXPECT_EQ(Why({"RSA could not verify certificate: 11"}, facts), "no-memory");
 }
 
@@ -134,11 +145,15 @@ TEST(WhyRefused, OfASignature) {
             "signature-file-changed META-INF/CERT.SF");
   EXPECT_EQ(Why({"SHA hash check unsuccessfull", "RSA could not verify data: 12"}, facts),
             "signature-file-changed META-INF/CERT.SF");
-  facts.jar.digest = "SHA-512";
-  EXPECT_EQ(Why(errors, facts), "signature-digest SHA-512");
-  facts.jar.signature_algorithm = "RSASSA-PSS";
+  facts.jar.block.digest = "SHA512";
+  facts.jar.block.has_known_digest = false;
+  EXPECT_EQ(Why(errors, facts), "signature-digest SHA512");
+  // A digest that was not read is none that is not known.
+  facts.jar.block.is_whole = false;
+  EXPECT_EQ(Why(errors, facts), "signature-wrong META-INF/CERT.RSA");
+  facts.jar.block.has_pss = true;
   EXPECT_EQ(Why(errors, facts), "signature-digest RSASSA-PSS");
-  facts.jar.has_signed_attributes = true;
+  facts.jar.block.has_signed_attributes = true;
   EXPECT_EQ(Why(errors, facts), "signed-attributes");
   EXPECT_EQ(Why({"RSA could not verify data: 11"}, facts), "no-memory");
 }
@@ -166,9 +181,13 @@ TEST(WhyRefused, OfWhatTheToolDoesNotMentionThePackageTells) {
   EXPECT_EQ(Why({}, facts), "signature-file-unreadable META-INF/CERT.SF");
   facts.jar.signature_files.clear();
   EXPECT_EQ(Why({}, facts), "signature-file-missing");
-  facts.jar.can_read_manifest = false;
+  facts.entries = {{{"META-INF/A.SF", 1, false}, false, true},
+                   {{"a", 1, true}, false, false},
+                   {{"META-INF/B.SF", 1, true}, false, true}};
+  EXPECT_EQ(Why({}, facts), "signature-file-unreadable META-INF/B.SF");
+  facts.jar.manifest = Archive::ReadResult::kDamaged;
   EXPECT_EQ(Why({}, facts), "manifest-unreadable");
-  facts.jar.has_manifest = false;
+  facts.jar.manifest = Archive::ReadResult::kMissing;
   EXPECT_EQ(Why({}, facts), "unsigned");
   facts.newer = {{"v2", {}}, {"v3", {}}};
   EXPECT_EQ(Why({}, facts), "newer-scheme-only v2, v3");
@@ -177,4 +196,13 @@ TEST(WhyRefused, OfWhatTheToolDoesNotMentionThePackageTells) {
 
 TEST(WhyRefused, ErrorThatIsNotKnownIsQuoted) {
   EXPECT_EQ(Why({"something new"}, Signed()), "tool-error something new");
+}
+
+TEST(WhyRefused, CertificateThatNobodyElseReadsDoesNotCarryAnOwnSignature) {
+  PackageFacts facts = Signed();
+  facts.jar.certificate.reset();
+  EXPECT_EQ(Why({"RSA could not verify certificate: 7"}, facts), "certificate-changed");
+  facts.jar.key.reset();
+  EXPECT_EQ(Why({"RSA could not verify certificate: 7"}, facts),
+            "signature-block-malformed META-INF/CERT.RSA");
 }

@@ -1,4 +1,4 @@
-#include "simulator/verdict/protection.h"
+#include "simulator/verdict/parts.h"
 
 #include <gtest/gtest.h>
 
@@ -10,39 +10,45 @@ namespace {
 // signature; each entry has another number of bytes.
 PackageFacts Package() {
   PackageFacts facts;
-  facts.jar.has_manifest = true;
+  facts.jar.manifest = Archive::ReadResult::kRead;
   facts.jar.signature_files = {"META-INF/CERT.SF"};
   facts.jar.certificate.emplace();
   facts.jar.certificate->subject = "CN=a";
   facts.jar.certificate->key.algorithm = "RSA";
   facts.jar.certificate->key.bits = 2048;
-  facts.entries = {{{"classes.dex", 1, 1, false}, true, false},
-                   {{"lib/arm64-v8a/a.so", 10, 10, false}, true, false},
-                   {{"lib/x86/a.so", 100, 100, false}, true, false},
-                   {{"res/a", 1000, 1000, false}, true, false},
-                   {{"added", 10000, 10000, false}, false, false},
-                   {{"META-INF/CERT.SF", 100000, 100000, false}, false, true}};
+  facts.entries = {{{"classes.dex", 1, false}, true, false},
+                   {{"lib/arm64-v8a/a.so", 10, false}, true, false},
+                   {{"lib/x86/a.so", 100, false}, true, false},
+                   {{"res/a", 1000, false}, true, false},
+                   {{"added", 10000, false}, false, false},
+                   {{"META-INF/CERT.SF", 100000, false}, false, true}};
   return facts;
 }
 
-Item PackageItem(const Cause* why) {
+Item PackageItem(const Cause* why, bool is_verified = false) {
   const ItemState state = why == nullptr ? ItemState::kDone : ItemState::kRefused;
-  return {ItemKind::kPackage, "package", "", state, {why, ""}};
+  return {ItemKind::kPackage, "package", "", state, {why, ""}, is_verified};
 }
 
-Item LibraryItem(const Cause* why) {
+Item LibraryItem(const Cause* why, bool is_verified = false) {
   const ItemState state = why == nullptr ? ItemState::kDone : ItemState::kRefused;
-  return {ItemKind::kLibrary, "lib/arm64/a.so", "lib/arm64-v8a/a.so", state, {why, ""}};
+  return {ItemKind::kLibrary, "lib/arm64/a.so", "lib/arm64-v8a/a.so", state,
+          {why, ""},          is_verified};
 }
 
-uint64_t Verified(const Cause* package, const Cause* library) {
-  return FindProtection(Package(), {PackageItem(package), LibraryItem(library)}).verified.bytes;
+Report With(const std::vector<Item>& items) {
+  Report report;
+  report.items = items;
+  report.signer = Package().jar.certificate;
+  report.key = {std::string(64, 'a'), 2048, true};
+  report.protection.verified = {2, 11};
+  return report;
 }
 
 // "h" for a link that holds, "x" for the broken one, "-" for one that was not reached.
-std::string ChainOf(const Cause* why) {
+std::string ChainOf(const std::vector<Item>& items) {
   std::string text;
-  for (const Link& link : MakeChain(Package(), {PackageItem(why)}, {})) {
+  for (const Link& link : MakeChain(Package(), With(items))) {
     text += "hx-"[static_cast<size_t>(link.state)];
   }
   return text;
@@ -52,54 +58,75 @@ std::string ChainOf(const Cause* why) {
 
 TEST(Protection, IsByWhatWasComparedListedAndNot) {
   const Protection protection =
-      FindProtection(Package(), {PackageItem(nullptr), LibraryItem(nullptr)});
+      FindProtection(Package(), {PackageItem(nullptr, true), LibraryItem(nullptr, true)});
   EXPECT_EQ(protection.verified.bytes, 11U);
   EXPECT_EQ(protection.verified.entries, 2U);
   EXPECT_EQ(protection.vouched.bytes, 1100U);
+  EXPECT_EQ(protection.vouched.entries, 2U);
   EXPECT_EQ(protection.unlisted.bytes, 10000U);
   EXPECT_EQ(protection.signature.bytes, 100000U);
   EXPECT_EQ(protection.unlisted_names, std::vector<std::string>({"added"}));
 }
 
-TEST(Protection, NothingIsVerifiedThatWasRefusedForItsSignature) {
-  EXPECT_EQ(Verified(&cause::kManifestChanged, &cause::kPackageRefused), 0U);
-  EXPECT_EQ(Verified(&cause::kDexChanged, &cause::kPackageRefused), 0U);
-  EXPECT_EQ(Verified(nullptr, &cause::kLibraryChanged), 1U);
+TEST(Protection, NothingIsVerifiedThatWasNotCompared) {
+  const auto verified = [](bool package, bool library) {
+    return FindProtection(Package(), {PackageItem(nullptr, package), LibraryItem(nullptr, library)})
+        .verified.bytes;
+  };
+  EXPECT_EQ(verified(false, false), 0U);
+  EXPECT_EQ(verified(true, false), 1U);
+  EXPECT_EQ(verified(false, true), 10U);
 }
 
-TEST(Protection, WhatTheKernelRefusedWasVerifiedBefore) {
-  EXPECT_EQ(Verified(&cause::kKernelRefused, &cause::kIntegrityZero), 11U);
+TEST(Chain, BreaksWhereTheCauseSays) {
+  EXPECT_EQ(ChainOf({PackageItem(nullptr)}), "hhhhh");
+  EXPECT_EQ(ChainOf({PackageItem(&cause::kKernelRefused)}), "hhhhh");
+  EXPECT_EQ(ChainOf({PackageItem(&cause::kExponentRefused)}), "x----");
+  EXPECT_EQ(ChainOf({PackageItem(&cause::kCertificateIssued)}), "hx---");
+  EXPECT_EQ(ChainOf({PackageItem(&cause::kSignedAttributes)}), "hhx--");
+  EXPECT_EQ(ChainOf({PackageItem(&cause::kManifestChanged)}), "hhhx-");
+  EXPECT_EQ(ChainOf({PackageItem(&cause::kDexChanged)}), "hhhhx");
+  EXPECT_EQ(ChainOf({PackageItem(&cause::kNotReached)}), "hhhhx");
 }
 
-TEST(Chain, BreaksWhereTheCauseIs) {
-  EXPECT_EQ(ChainOf(nullptr), "hhhhh");
-  EXPECT_EQ(ChainOf(&cause::kKernelRefused), "hhhhh");
-  EXPECT_EQ(ChainOf(&cause::kExponentRefused), "x----");
-  EXPECT_EQ(ChainOf(&cause::kCertificateIssued), "hx---");
-  EXPECT_EQ(ChainOf(&cause::kSignedAttributes), "hhx--");
-  EXPECT_EQ(ChainOf(&cause::kManifestChanged), "hhhx-");
-  EXPECT_EQ(ChainOf(&cause::kDexChanged), "hhhhx");
+TEST(Chain, BreaksAtALibraryUnlessThePackageDoesBefore) {
+  EXPECT_EQ(ChainOf({PackageItem(nullptr), LibraryItem(&cause::kLibraryChanged)}), "hhhhx");
+  EXPECT_EQ(ChainOf({PackageItem(nullptr), LibraryItem(&cause::kLibraryMissing)}), "hhhhh");
+  EXPECT_EQ(ChainOf({PackageItem(nullptr), LibraryItem(&cause::kKernelRefused)}), "hhhhh");
+  EXPECT_EQ(ChainOf({PackageItem(&cause::kUnsigned), LibraryItem(&cause::kPackageRefused)}),
+            "x----");
+}
+
+// What goes wrong with the run is no matter of the signature.
+TEST(Chain, IsNotBrokenByAnotherItem) {
+  const Item tool = {ItemKind::kTool, "tool", "", ItemState::kRefused, {&cause::kToolError, "x"}};
+  EXPECT_EQ(ChainOf({PackageItem(nullptr), tool}), "hhhhh");
 }
 
 TEST(Chain, SaysWhatStandsThereOrWhyItBreaks) {
-  const std::vector<Link> chain = MakeChain(Package(), {PackageItem(&cause::kManifestChanged)}, {});
+  const std::vector<Link> chain =
+      MakeChain(Package(), With({PackageItem(&cause::kManifestChanged)}));
   EXPECT_EQ(chain[0].text, "RSA-2048");
   EXPECT_EQ(chain[1].text, "CN=a");
   EXPECT_EQ(chain[2].text, "META-INF/CERT.SF");
   EXPECT_EQ(chain[3].text, "META-INF/MANIFEST.MF was changed after it was signed");
+  EXPECT_EQ(MakeChain(Package(), With({PackageItem(nullptr)}))[3].text, "META-INF/MANIFEST.MF");
+  EXPECT_EQ(MakeChain(Package(), With({PackageItem(nullptr)}))[4].text,
+            "2 compared with the manifest");
+  EXPECT_EQ(
+      MakeChain(Package(), With({PackageItem(nullptr), LibraryItem(&cause::kLibraryDigest)}))[4]
+          .text,
+      std::string("lib/arm64/a.so: ") + cause::kLibraryDigest.reason);
 }
 
-TEST(Chain, EndsWithWhatWasComparedOrTheLibraryThatIsAnother) {
-  const auto end = [](const Cause* package, const Cause* library) {
-    return MakeChain(Package(), {PackageItem(package), LibraryItem(library)}, {2, 11})[4];
-  };
-  EXPECT_EQ(end(nullptr, nullptr).text, "2 compared with the manifest");
-  EXPECT_EQ(end(nullptr, &cause::kKernelRefused).state, LinkState::kHolds);
-  EXPECT_EQ(end(nullptr, &cause::kLibraryMissing).state, LinkState::kHolds);
-  for (const Cause* why :
-       {&cause::kLibraryChanged, &cause::kLibraryNotListed, &cause::kLibraryDigest}) {
-    EXPECT_EQ(end(nullptr, why).state, LinkState::kBroken);
-    EXPECT_EQ(end(nullptr, why).text, std::string("lib/arm64/a.so: ") + why->reason);
+TEST(Chain, SaysNothingOfWhatIsNotThere) {
+  Report report = With({PackageItem(&cause::kUnsigned)});
+  report.signer.reset();
+  report.key.reset();
+  for (const Link& link : MakeChain({}, report)) {
+    EXPECT_EQ(link.text, link.state == LinkState::kBroken      ? cause::kUnsigned.reason
+                         : link.name == std::string("entries") ? "2 compared with the manifest"
+                                                               : "")
+        << link.name;
   }
-  EXPECT_EQ(end(&cause::kManifestChanged, &cause::kPackageRefused).state, LinkState::kNotReached);
 }

@@ -15,16 +15,21 @@ namespace simulator {
 enum class Mood { kGood, kMixed, kBad };
 
 struct VerdictWords {
+  const char* code;  // for programs
   const char* word;
   const char* one;  // in the summary, after a number
   const char* many;
   Mood mood;
 };
 
-VerdictWords WordsOf(Verdict verdict);
+const VerdictWords& WordsOf(Verdict verdict);
 
 // Such as "3 files: 1 signed, 2 refused".
 std::string Summary(const std::vector<Verdict>& verdicts);
+
+// What stands in the line of the verdict behind the file: the package's name, the signer and his
+// key, and the warnings that are alarms. `ellipsis` stands in the midst of a digest.
+std::vector<std::string> HeadFacts(const Report& report, const char* ellipsis);
 
 // What stands before a line.
 enum class Mark { kGood, kBad, kNeither };
@@ -47,13 +52,12 @@ bool HasCure(const Item& item, const Item* next);
 // What stands at the link, and "not reached" beyond a break.
 std::string TextOf(const Link& link);
 
-// Such as "CN=Vault, RSA-2048, key 98302ce8…f64646"; `ellipsis` stands in the digest's midst.
-std::string SignerText(const CertificateFacts& signer, const char* ellipsis);
-
 // Label and value for each fact. The labels are those of apksigner, so that one search finds both.
-// The kernel gets the key of the JAR signature's signer, and no other.
-std::vector<std::pair<std::string, std::string>> CertificateRows(
-    const CertificateFacts& certificate, bool is_jar_signer);
+using Rows = std::vector<std::pair<std::string, std::string>>;
+// Of a certificate as others read it.
+Rows CertificateRows(const CertificateFacts& certificate);
+// Of the JAR signature: the certificate, and what the kernel got of the key.
+Rows SignerRows(const Report& report);
 
 // The words for a share of the package.
 inline constexpr char kVerifiedWord[] = "verified";

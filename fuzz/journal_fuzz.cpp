@@ -1,0 +1,103 @@
+// What the simulator reads of a journal, which holds names and texts that a package influences: its
+// texts and their way back, one line of the tool's log, and all of a run. The first byte says
+// which.
+#include <algorithm>
+#include <sstream>
+#include <string>
+
+#include "fuzz/fuzz.h"
+#include "simulator/phone/text.h"
+#include "simulator/run/run_record.h"
+#include "simulator/show/timeline.h"
+#include "util/log.h"
+
+using namespace simulator;
+using nlohmann::json;
+
+namespace {
+
+// Of UTF-8, line ends aside.
+bool HasHidden(std::string_view text) {
+  while (!text.empty()) {
+    const size_t length = Utf8Length(text);
+    if (length == 0 || (text[0] != '\n' && IsHidden(text.substr(0, length)))) return true;
+    text.remove_prefix(length);
+  }
+  return false;
+}
+
+void JudgeText(std::string_view bytes) {
+  const std::string encoded = EncodeText(bytes);
+  Require(!HasHidden(encoded) && encoded.find('\n') == std::string::npos, "all is shown");
+  Require(DecodeText(json::parse(encoded).get<std::string>()) == bytes, "the same bytes come back");
+  DecodeText(bytes);
+  for (const bool has_utf8 : {false, true}) {
+    const std::string shown = Printable(bytes, {false, has_utf8});
+    Require(!HasHidden(shown) && shown.find('\n') == std::string::npos, "nothing is obeyed");
+    const bool is_ascii = std::all_of(shown.begin(), shown.end(), [](char c) { return c >= 0; });
+    Require(has_utf8 || is_ascii, "what cannot be shown is escaped");
+  }
+}
+
+void JudgeLogLine(std::string_view bytes) {
+  const std::string text(bytes);
+  const LogLine line = ReadLogLine(text);
+  Require(text.rfind(line.whole, 0) == 0 && text.size() - line.whole.size() <= 1,
+          "all but the end");
+  Require(text.find(line.text) != std::string::npos, "what is captured stands in the line");
+  const bool is_known = line.meaning != LogMeaning::kUnknown;
+  Require(is_known || (line.text.empty() && line.number == 0),
+          "nothing is captured of the unknown");
+}
+
+size_t CountOf(const Events& events, const char* kind, bool is_success) {
+  return static_cast<size_t>(std::count_if(events.begin(), events.end(), [&](const json& event) {
+    return TextOf(event, "event") == kind && (!is_success || IsSuccess(event));
+  }));
+}
+
+// Nothing is made more of than the kernel said, and nothing is lost.
+void JudgeRecord(const Events& events) {
+  const RunRecord record = TakeApart(events);
+  Require(record.events == events, "the events are kept");
+  std::vector<Attempt> attempts = record.libraries;
+  if (record.own) attempts.push_back(*record.own);
+  size_t is_signed = 0, answers = 0;
+  for (const Attempt& attempt : attempts) {
+    const bool was_signed = attempt.outcome == Attempt::Outcome::kSigned;
+    is_signed += was_signed;
+    answers += was_signed || attempt.outcome == Attempt::Outcome::kKernelRefused;
+    Require(attempt.outcome != Attempt::Outcome::kBegun, "what came to nothing is not kept");
+    const auto has_payload = [&](const json& event) {
+      return TextOf(event, "event") == "sign" && IsSuccess(event) &&
+             TextOf(event, "payload") == attempt.payload;
+    };
+    Require(!was_signed || std::any_of(events.begin(), events.end(), has_payload), "the payload");
+  }
+  Require(is_signed == CountOf(events, "sign", true), "signed is what the kernel signed");
+  Require(answers == CountOf(events, "sign", false), "each answer of the kernel is kept");
+  Require(record.registrations.size() == CountOf(events, "register", false), "each registration");
+  Require(record.verify_error != 0 || CountOf(events, "verify", true) > 0, "trusted by the kernel");
+}
+
+void JudgeJournal(std::string_view bytes) {
+  const Events events = ParseEvents(std::string(bytes));
+  JudgeRecord(events);
+  const std::vector<TimelineLine> timeline = MakeTimeline(events, "/data/app/base.apk");
+  Require(timeline.size() <= events.size(), "a line for each event at most");
+  std::ostringstream out;
+  PrintTimeline(timeline, Look(), out);
+  Require(!HasHidden(out.str()), "nothing is obeyed");
+}
+
+}  // namespace
+
+extern "C" int LLVMFuzzerTestOneInput(const uint8_t* data, size_t size) {
+  constexpr void (*kReaders[])(std::string_view) = {JudgeText, JudgeLogLine, JudgeJournal};
+  if (size == 0) return 0;
+  const size_t which = data[0] % (sizeof(kReaders) / sizeof(kReaders[0]));
+  // A copy of its own size, so that one byte too far is found.
+  const std::vector<char> copy(data + 1, data + size);
+  kReaders[which]({copy.data(), copy.size()});
+  return 0;
+}

@@ -1,0 +1,20 @@
+// Bytes that nobody vouches for, as libcrypto's reader takes them; it never leaves them.
+#pragma once
+
+#include <openssl/bytestring.h>
+
+#include <string_view>
+
+namespace simulator {
+
+inline CBS ToCbs(std::string_view bytes) {
+  CBS cbs;
+  CBS_init(&cbs, reinterpret_cast<const uint8_t*>(bytes.data()), bytes.size());
+  return cbs;
+}
+
+inline std::string_view ToView(const CBS& cbs) {
+  return {reinterpret_cast<const char*>(CBS_data(&cbs)), CBS_len(&cbs)};
+}
+
+}  // namespace simulator

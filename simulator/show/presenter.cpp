@@ -1,0 +1,127 @@
+#include "simulator/show/presenter.h"
+
+#include <unistd.h>
+
+#include <algorithm>
+#include <iostream>
+
+#include "simulator/phone/journal.h"
+#include "simulator/show/verdict_event.h"
+#include "simulator/show/words.h"
+
+namespace simulator {
+
+namespace {
+
+constexpr OutputKind kJournal = {"--journal", "journal", "{\"event\":\"journal\""};
+constexpr OutputKind kPage = {"--html", "page", kPageStart};
+constexpr char kEraseLine[] = "\r\x1b[K";
+
+}  // namespace
+
+Presenter::Presenter(const ShowOptions& options, size_t file_count)
+    : options_(options),
+      file_count_(file_count),
+      has_progress_(isatty(STDERR_FILENO) != 0),
+      look_(LookOfStandardOutput()),
+      journal_(kJournal, options.journal),
+      page_file_(kPage, options.html) {}
+
+std::optional<std::string> Presenter::Objection(const std::vector<std::string>& inputs) const {
+  if (journal_.IsSameAs(page_file_)) return "--journal and --html name the same file";
+  if (auto objection = journal_.Objection(inputs)) return objection;
+  return page_file_.Objection(inputs);
+}
+
+bool Presenter::Begin() {
+  if (!journal_.Open()) {
+    FailToWrite(journal_);
+  } else {
+    Keep(Event("journal").Number("version", kJournalVersion).Line());
+  }
+  if (!page_file_.Open()) FailToWrite(page_file_);
+  return status_ == kAllSigned;
+}
+
+void Presenter::Show(const Report& report, const std::string& journal) {
+  EraseProgress();
+  ++shown_;
+  Keep(journal + VerdictEvent(report));
+  if (!options_.json) {
+    const bool has_gap = !verdicts_.empty() && options_.detail != Detail::kVerdict;
+    if (has_gap) std::cout << '\n';
+    PrintReport(report, options_.detail, look_, std::cout);
+  }
+  if (page_file_.IsWanted()) page_.Add(report);
+  std::cout.flush();
+  verdicts_.push_back(report.verdict);
+  if (report.verdict == Verdict::kNotSimulated) {
+    Complain(kCannotSimulate, report.file + ": " + report.items[0].reason.Text());
+  }
+  status_ = std::max<int>(status_, StatusOf(report.verdict));
+}
+
+void Presenter::ShowAnswer(const RunRecord& run, const Report& report, const std::string& journal) {
+  EraseProgress();
+  ++shown_;
+  Keep(journal);
+  for (const auto& event : run.events) {
+    const bool is_output = TextOf(event, "event") == "stdout";
+    if (is_output && !options_.json) std::cout << TextOf(event, "text");
+  }
+  std::cout.flush();
+  std::string problem;
+  if (run.signal) problem = "it was killed by signal " + std::to_string(*run.signal);
+  if (run.failure.kind != Failure::Kind::kNone) problem = report.items[0].reason.Text();
+  if (!problem.empty()) Complain(kCannotSimulate, run.file + ": " + problem);
+  const int status = static_cast<int>(run.status);
+  status_ = std::max(status_, problem.empty() ? status : kCannotSimulate);
+}
+
+// Erased again before anything else is written.
+void Presenter::ShowProgress(const std::string& file, int seconds) {
+  if (!has_progress_) return;
+  std::cerr << kEraseLine << shown_ << " of " << file_count_ << " done; " << Printable(file, look_)
+            << ": " << seconds << " s" << std::flush;
+  is_progress_shown_ = true;
+}
+
+void Presenter::EraseProgress() {
+  if (is_progress_shown_) std::cerr << kEraseLine << std::flush;
+  is_progress_shown_ = false;
+}
+
+int Presenter::Finish() {
+  EraseProgress();
+  if (!options_.json && options_.detail != Detail::kVerdict && file_count_ > 1 &&
+      !verdicts_.empty()) {
+    std::cout << '\n' << Summary(verdicts_) << '\n';
+  }
+  if (page_file_.IsWanted() && !page_file_.Append(page_.Html())) FailToWrite(page_file_);
+  return EndWith(status_);
+}
+
+// The journal goes to its file, and to standard output when that is asked for.
+void Presenter::Keep(const std::string& journal) {
+  if (options_.json) std::cout << journal;
+  if (!journal_.Append(journal)) FailToWrite(journal_);
+}
+
+void Presenter::FailToWrite(const OutputFile& file) {
+  status_ = std::max(status_, Complain(kCannotSimulate, file.ErrorText()));
+}
+
+int Complain(int status, const std::string& message) {
+  std::cout.flush();
+  std::cerr << "apktoolkit-sim: " << Printable(message, {false, LookOfStandardOutput().has_utf8})
+            << '\n';
+  return status;
+}
+
+int EndWith(int status) {
+  std::cout.flush();
+  if (std::cout) return status;
+  return Complain(std::max<int>(status, kCannotSimulate), "cannot write to standard output");
+}
+
+}  // namespace simulator

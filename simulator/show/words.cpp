@@ -1,0 +1,129 @@
+#include "simulator/show/words.h"
+
+#include <algorithm>
+
+namespace simulator {
+
+namespace {
+
+// In the order of the verdicts.
+constexpr VerdictWords kVerdicts[] = {
+    {"signed", "SIGNED", "signed", "signed", Mood::kGood},
+    {"trusted-jar", "TRUSTED JAR", "trusted JAR", "trusted JARs", Mood::kGood},
+    {"partly-signed", "PARTLY SIGNED", "partly signed", "partly signed", Mood::kMixed},
+    {"refused", "REFUSED", "refused", "refused", Mood::kBad},
+    {"not-trusted-jar", "NOT TRUSTED JAR", "JAR not trusted", "JARs not trusted", Mood::kBad},
+    {"not-looked-at", "NOT LOOKED AT", "not looked at", "not looked at", Mood::kBad},
+    {"not-simulated", "NOT SIMULATED", "not simulated", "not simulated", Mood::kBad},
+};
+
+std::string SignerText(const Report& report, const char* ellipsis);
+
+}  // namespace
+
+const VerdictWords& WordsOf(Verdict verdict) { return kVerdicts[static_cast<size_t>(verdict)]; }
+
+std::string Summary(const std::vector<Verdict>& verdicts) {
+  std::string text = Counted(verdicts.size(), "file", "files");
+  const char* separator = ": ";
+  for (const VerdictWords& words : kVerdicts) {
+    const auto count = std::count_if(verdicts.begin(), verdicts.end(),
+                                     [&](Verdict verdict) { return &WordsOf(verdict) == &words; });
+    if (count == 0) continue;
+    text += separator + Counted(static_cast<uint64_t>(count), words.one, words.many);
+    separator = ", ";
+  }
+  return text;
+}
+
+std::vector<std::string> HeadFacts(const Report& report, const char* ellipsis) {
+  std::vector<std::string> facts;
+  if (!report.package_name.empty()) facts.push_back(report.package_name);
+  if (report.signer || report.key) facts.push_back("signer " + SignerText(report, ellipsis));
+  for (const Reason& warning : report.warnings) {
+    if (warning.cause->severity == Severity::kAlarm) facts.push_back("! " + warning.Text());
+  }
+  return facts;
+}
+
+Mark MarkOf(ItemState state) {
+  if (state == ItemState::kDone) return Mark::kGood;
+  return state == ItemState::kRefused ? Mark::kBad : Mark::kNeither;
+}
+
+Mark MarkOf(LinkState state) {
+  if (state == LinkState::kHolds) return Mark::kGood;
+  return state == LinkState::kBroken ? Mark::kBad : Mark::kNeither;
+}
+
+const char* SymbolOf(Mark mark, bool has_utf8) {
+  constexpr const char* kSymbols[][2] = {{"+", "✓"}, {"x", "✗"}, {"-", "–"}};
+  return kSymbols[static_cast<size_t>(mark)][has_utf8 ? 1 : 0];
+}
+
+std::string NameOf(const Item& item) { return item.kind == ItemKind::kKey ? "key" : item.name; }
+
+std::string OutcomeOf(const Item& item, Verdict verdict) {
+  std::string reason = item.reason.Text();
+  if (item.state == ItemState::kDone) {
+    if (item.kind == ItemKind::kPackage) return "signed with the payload of that key";
+    if (item.kind == ItemKind::kJar) return "signed, without data";
+    if (item.kind == ItemKind::kKey) return "registered for " + item.name;
+    return "signed";
+  }
+  if (item.state != ItemState::kRefused) return "nothing to sign: " + reason;
+  if (item.kind == ItemKind::kTool || item.kind == ItemKind::kEntries) return reason;
+  if (item.kind == ItemKind::kKey) return "not registered: " + reason;
+  return (verdict == Verdict::kNotLookedAt ? "not looked at: " : "not signed: ") + reason;
+}
+
+bool HasCure(const Item& item, const Item* next) {
+  const Cause* const why = item.reason.cause;
+  if (why == nullptr) return false;
+  if (why->severity == Severity::kNothing || why->severity == Severity::kFollows) return false;
+  return next == nullptr || next->reason.cause != why;
+}
+
+std::string TextOf(const Link& link) {
+  return link.state == LinkState::kNotReached ? "not reached" : link.text;
+}
+
+Rows CertificateRows(const CertificateFacts& certificate) {
+  const PublicKey& key = certificate.key;
+  Rows rows = {{"certificate DN", certificate.subject},
+               {"certificate SHA-256 digest", certificate.sha256},
+               {"key algorithm", key.algorithm}};
+  if (key.bits != 0) rows.emplace_back("key size (bits)", std::to_string(key.bits));
+  rows.emplace_back("public key SHA-256 digest", key.sha256);
+  if (!key.modulus_sha256.empty()) {
+    rows.emplace_back("modulus SHA-256 digest", key.modulus_sha256 + " (of the modulus alone)");
+  }
+  return rows;
+}
+
+Rows SignerRows(const Report& report) {
+  Rows rows;
+  if (report.signer) rows = CertificateRows(*report.signer);
+  if (!report.key) return rows;
+  if (!rows.empty() && !report.signer->key.modulus_sha256.empty()) rows.pop_back();
+  const char* const use =
+      report.key->was_got ? ": what the kernel got)" : ", as the tool reads it)";
+  rows.emplace_back("modulus SHA-256 digest", report.key->sha256 + " (of the modulus alone" + use);
+  return rows;
+}
+
+namespace {
+
+// Such as "CN=Vault, RSA-2048, key 98302ce8…f64646".
+std::string SignerText(const Report& report, const char* ellipsis) {
+  std::string text = report.signer ? report.signer->subject : "unknown";
+  if (const std::string key = KeyName(report); !key.empty()) text += ", " + key;
+  if (!report.key) return text;
+  const std::string& digest = report.key->sha256;
+  if (digest.size() < 16) return text + ", key " + digest;
+  return text + ", key " + digest.substr(0, 8) + ellipsis + digest.substr(digest.size() - 6);
+}
+
+}  // namespace
+
+}  // namespace simulator

@@ -1,0 +1,41 @@
+// The parts of a report, each made by a file of its own: package_reason.cpp, library_items.cpp,
+// warnings.cpp and protection.cpp.
+#pragma once
+
+#include <vector>
+
+#include "simulator/verdict/make_report.h"
+
+namespace simulator {
+
+// Why the tool refused a whole file before it asked the kernel: what it logged says where it
+// stopped, what can be seen in the file says why. For a file that is neither signed nor a plain
+// JAR.
+Reason WhyRefused(const RunRecord& run, const PackageFacts& facts);
+
+// For a file that the tool did not look at; a null cause when it had no reason not to.
+Reason WhyNotLookedAt(const PackageFacts& facts, bool has_standard_input);
+
+// Why the kernel did not sign the file; a null cause when it did.
+Reason WhyKernelDidNotSign(const Attempt& attempt);
+
+// Adds an item for each of a package's native libraries: which of them were to be signed, and what
+// came of each. The first item is the file's own.
+void AddLibraryItems(const RunRecord& run, const PackageFacts& facts, const JudgeOptions& options,
+                     std::vector<Item>* items);
+
+// What is worth knowing of a file although it changes nothing for the kernel. Of the report the
+// items, the signers and the key are filled. What the file's own item says already is not said
+// twice.
+std::vector<Reason> FindWarnings(const RunRecord& run, const PackageFacts& facts,
+                                 const Report& report);
+
+// What a package's signature protects, by bytes. `items` are the report's, the package's own first.
+Protection FindProtection(const PackageFacts& facts, const std::vector<Item>& items);
+
+// The chain from the key to the entries. It breaks where the cause says for which the package
+// itself was refused, else where a library is not the one that was signed. Of the report all but
+// the chain is filled.
+std::vector<Link> MakeChain(const PackageFacts& facts, const Report& report);
+
+}  // namespace simulator

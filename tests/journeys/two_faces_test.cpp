@@ -1,0 +1,301 @@
+// Packages that others take for somebody else's than the tool does: the simulator names the key
+// that the kernel got, wherever it names one, and sounds the alarm in the line of the verdict.
+#include <gmpxx.h>
+#include <gtest/gtest.h>
+#include <openssl/mem.h>
+
+#include <algorithm>
+#include <nlohmann/json.hpp>
+#include <sstream>
+
+#include "support/compiled_manifest.h"
+#include "support/files.h"
+#include "support/keys.h"
+#include "support/package.h"
+#include "support/process.h"
+#include "support/signing_block.h"
+#include "support/simulation.h"
+
+namespace {
+
+using nlohmann::json;
+
+// SHA-256 of the modulus of the key whose owner made none of these packages.
+std::string VictimsDigest() { return Hex(DigestOf(Digest::kSha256, ModulusOf("rsa-2048"))); }
+
+// A key with the public exponent 65537, and how to sign with it.
+struct OwnKey {
+  mpz_class modulus;
+  mpz_class secret;  // the private exponent
+  size_t size;       // of the modulus as the tool counts it, in bytes
+
+  Bytes Encoded(const mpz_class& number) const {
+    const size_t used = (mpz_sizeinbase(number.get_mpz_t(), 2) + 7) / 8;
+    Bytes bytes(size);
+    mpz_export(bytes.data() + (size - used), nullptr, 1, 1, 0, 0, number.get_mpz_t());
+    return bytes;
+  }
+  Bytes Sign(const Bytes& data) const {
+    const Bytes message = EncodedMessage(Digest::kSha256, data, size);
+    mpz_class number, signature;
+    mpz_import(number.get_mpz_t(), message.size(), 1, 1, 0, 0, message.data());
+    mpz_powm(signature.get_mpz_t(), number.get_mpz_t(), secret.get_mpz_t(), modulus.get_mpz_t());
+    return Encoded(signature);
+  }
+};
+
+// The package, signed anew with this certificate and key.
+Package SignedAgain(Package package, Certificate certificate, const OwnKey& key) {
+  certificate.signature = der::BitString(key.Sign(certificate.Tbs()));
+  SignatureBlock block;
+  block.certificates = certificate.Build();
+  const Bytes signature_file = package.Item("META-INF/CERT.SF").data;
+  block.encrypted_digest = der::OctetString(key.Sign(signature_file));
+  package.Item("META-INF/CERT.RSA").data = block.Build(signature_file);
+  return package;
+}
+
+// The certificate shows the victim's modulus. An exponent of eight bytes makes the tool read on
+// behind it for 300 bytes in all, up to such of an extension that the number is a prime: whoever
+// wrote it can sign for it.
+Package WithAPrimeBehindTheVictimsModulus(std::string* digest) {
+  constexpr size_t kSize = 300;
+  Certificate certificate;
+  certificate.public_key_info =
+      PublicKeyInfoAround(der::Sequence({der::Integer(Concat({{0}, ModulusOf("rsa-2048")})),
+                                         der::Integer(FromHex("01 00 01 00 2c 01 00 00"))}));
+  Bytes free(40, 0);
+  const auto number_read = [&] {
+    certificate.extensions = {Extension("2.5.29.99", free)};
+    const Bytes tbs = certificate.Tbs();
+    const Bytes modulus = ModulusOf("rsa-2048");
+    const auto at = std::search(tbs.begin(), tbs.end(), modulus.begin(), modulus.end());
+    return Bytes(at, at + kSize);
+  };
+  // The last of them that is read is the byte that a change of the prime's last ones ends with.
+  const Bytes before = number_read();
+  OwnKey key = {0, 0, kSize};
+  mpz_import(key.modulus.get_mpz_t(), kSize, 1, 1, 0, 0, before.data());
+  mpz_nextprime(key.modulus.get_mpz_t(), key.modulus.get_mpz_t());
+  const Bytes prime = key.Encoded(key.modulus);
+  size_t kept = 0;  // of the free bytes, how many are read
+  while (kept < free.size()) {
+    free[kept] = 0xee;
+    if (number_read() == before) break;
+    free[kept++] = 0;
+  }
+  std::copy(prime.end() - static_cast<ptrdiff_t>(kept), prime.end(), free.begin());
+  std::fill(free.begin() + static_cast<ptrdiff_t>(kept), free.end(), uint8_t{0});
+  EXPECT_EQ(Hex(number_read()), Hex(prime));
+  const mpz_class order = key.modulus - 1, exponent = 65537;
+  mpz_invert(key.secret.get_mpz_t(), exponent.get_mpz_t(), order.get_mpz_t());
+  *digest = Hex(DigestOf(Digest::kSha256, prime));
+  return SignedAgain(MakePackage(), certificate, key);
+}
+
+// Two zeros before the modulus, one of which stays in the tool's key and its digest.
+Package WithAZeroBeforeTheModulus(std::string* digest) {
+  const RSA* const rsa = TestRsaKey("rsa-2048");
+  const auto number = [](const BIGNUM* from) {
+    char* const digits = BN_bn2hex(from);
+    const mpz_class made(digits, 16);
+    OPENSSL_free(digits);
+    return made;
+  };
+  const OwnKey key = {number(RSA_get0_n(rsa)), number(RSA_get0_d(rsa)), 257};
+  Certificate certificate;
+  certificate.public_key_info = PublicKeyInfoAround(der::Sequence(
+      {der::Integer(Concat({{0, 0}, ModulusOf("rsa-2048")})), der::Integer({1, 0, 1})}));
+  *digest = Hex(DigestOf(Digest::kSha256, Concat({{0}, ModulusOf("rsa-2048")})));
+  return SignedAgain(MakePackage(), certificate, key);
+}
+
+// All that is told of a package: the line of the verdict, the text, the journal's verdict, the
+// page.
+struct Told {
+  explicit Told(const Package& package, const std::vector<std::string>& options = {})
+      : Told(package.Build(), options) {}
+  explicit Told(const Bytes& archive, const std::vector<std::string>& options = {}) {
+    const TempDir folder;
+    WriteFile(folder / "base.apk", archive);
+    const auto run = [&](std::vector<std::string> words) {
+      words.insert(words.begin(), {"env", "LC_ALL=C.UTF-8", SimulatorPath()});
+      words.insert(words.end(), options.begin(), options.end());
+      words.emplace_back("base.apk");
+      return RunProcess(words, folder.path());
+    };
+    const ProcessResult quiet = run({"--quiet"});
+    status = quiet.status;
+    head = quiet.output;
+    text = run({"--verbose", "--html", "page.html"}).output;
+    page = ContentOf(folder / "page.html");
+    std::istringstream lines(run({"--json"}).output);
+    for (std::string line; std::getline(lines, line);) verdict = json::parse(line);
+  }
+
+  std::vector<std::string> Warnings() const {
+    std::vector<std::string> codes;
+    for (const json& warning : verdict["warnings"]) codes.push_back(warning["reason"]);
+    return codes;
+  }
+
+  int status;
+  std::string head;
+  std::string text;
+  std::string page;
+  json verdict;
+};
+
+bool Has(const std::string& text, const std::string& part) {
+  return text.find(part) != std::string::npos;
+}
+
+std::string Shortened(const std::string& digest) {
+  return digest.substr(0, 8) + "…" + digest.substr(58);
+}
+
+using Codes = std::vector<std::string>;
+
+void ExpectKey(const Told& told, const std::string& digest) {
+  EXPECT_EQ(told.verdict["payload"], "2000" + digest);
+  EXPECT_EQ(told.verdict["signers"][0]["modulus_sha256"], digest);
+  EXPECT_TRUE(Has(told.head, "key " + Shortened(digest))) << told.head;
+  const std::string row = digest + " (of the modulus alone: what the kernel got)";
+  EXPECT_TRUE(Has(told.text, "modulus SHA-256 digest: " + row)) << told.text;
+  EXPECT_TRUE(Has(told.page, "<dd>" + row)) << told.page;
+}
+
+}  // namespace
+
+TEST(TwoFaces, ExponentThatWritesTheModulusLengthShowsNoVictimsKey) {
+  std::string digest;
+  const Told told(WithAPrimeBehindTheVictimsModulus(&digest));
+  EXPECT_EQ(told.status, 0);
+  ASSERT_NE(digest, VictimsDigest());
+  ExpectKey(told, digest);
+  EXPECT_TRUE(Has(told.head, "SIGNED  base.apk   com.example.app   signer CN=Test, RSA-2400, key "))
+      << told.head;
+  EXPECT_TRUE(Has(told.head, "   ! its certificate shows another key than the tool reads: "));
+  EXPECT_EQ(told.Warnings(), Codes({"certificate-other-key"}));
+  for (const std::string& all : {told.head, told.text, told.page, told.verdict.dump()}) {
+    EXPECT_FALSE(Has(all, VictimsDigest().substr(0, 8))) << all;
+  }
+}
+
+TEST(TwoFaces, TwoZerosBeforeTheModulusMakeAnotherKey) {
+  std::string digest;
+  const Told told(WithAZeroBeforeTheModulus(&digest));
+  EXPECT_EQ(told.status, 0);
+  ASSERT_NE(digest, VictimsDigest());
+  ExpectKey(told, digest);
+  EXPECT_TRUE(Has(told.head, "   ! its certificate shows another key than the tool reads: "));
+  EXPECT_EQ(told.Warnings(), Codes({"certificate-other-key"}));
+}
+
+// An exponent of five bytes is one that others take as it is, and so they read the certificate.
+TEST(TwoFaces, CertificateThatOthersReadIsComparedWithTheKernelsKey) {
+  Certificate certificate;
+  certificate.public_key_info =
+      PublicKeyInfoAround(der::Sequence({der::Integer(Concat({{0}, ModulusOf("rsa-2048")})),
+                                         der::Integer(FromHex("01 00 01 00 01"))}));
+  PackageOptions options;
+  options.block.certificates = certificate.Build();
+  const Told told(MakePackage(options));
+  EXPECT_EQ(told.status, 1);
+  EXPECT_TRUE(Has(told.head,
+                  "   ! its certificate shows another key than the tool reads: modulus "
+                  "SHA-256 digest: " +
+                      VictimsDigest()))
+      << told.head;
+  EXPECT_FALSE(Has(told.head, "key " + Shortened(VictimsDigest())));
+}
+
+TEST(TwoFaces, BlockThatNoStrictReaderReadsIsAmbiguous) {
+  Package package = MakePackage();
+  Bytes& block = package.Item("META-INF/CERT.RSA").data;
+  const Bytes certificate = SignatureBlock().SignerCertificate().Build();
+  const auto at = std::search(block.begin(), block.end(), certificate.begin(), certificate.end());
+  ASSERT_NE(at, block.end());
+  // The tag of the certificates, which the tool does not look at.
+  at[-4] = 0xa3;
+  const Told told(package);
+  EXPECT_EQ(told.status, 0);
+  ExpectKey(told, VictimsDigest());
+  EXPECT_TRUE(Has(told.head, "SIGNED  base.apk   com.example.app   signer unknown, RSA-2048, key "))
+      << told.head;
+  EXPECT_EQ(told.Warnings(), Codes({"block-ambiguous"}));
+}
+
+TEST(TwoFaces, SignatureThatNamesAnotherCertificateIsAmbiguous) {
+  PackageOptions options;
+  options.block.serial = der::Integer(99);
+  const Told told(MakePackage(options));
+  EXPECT_EQ(told.status, 0);
+  EXPECT_EQ(told.Warnings(), Codes({"block-ambiguous"}));
+  EXPECT_TRUE(Has(told.head, "   ! others may read another signer"));
+}
+
+TEST(TwoFaces, PackageNameOfAnotherNamespaceIsToldBesideTheInstallers) {
+  PackageOptions options;
+  options.android_manifest =
+      CompiledXml()
+          .Element("manifest", {InAndroidNamespace(StringAttribute("package", "com.victim.bank")),
+                                StringAttribute("package", "com.evil.reader")})
+          .Build();
+  const Told told(MakePackage(options));
+  EXPECT_EQ(told.status, 0);
+  EXPECT_EQ(told.verdict["package"], "com.victim.bank");
+  EXPECT_TRUE(Has(told.head, "   com.victim.bank   ")) << told.head;
+  EXPECT_TRUE(Has(told.head, "   ! phones install it as \"com.evil.reader\""));
+  EXPECT_EQ(told.Warnings(), Codes({"other-package-name"}));
+}
+
+// ---- The newer signatures: what the platform reads counts.
+
+TEST(TwoFaces, SecondValueOfASchemeIsNobodys) {
+  const Bytes own = Signers({SignerBytes(SignatureBlock().SignerCertificate().Build())});
+  Certificate certificate;
+  certificate.key = "rsa-2048-other";
+  const Bytes other = Signers({SignerBytes(certificate.Build())});
+  const Bytes both = Signers({SignerBytes(SignatureBlock().SignerCertificate().Build()),
+                              SignerBytes(certificate.Build())});
+  const auto warnings = [](const std::vector<std::pair<uint32_t, Bytes>>& pairs) {
+    return Told(ArchiveWithBlock(MakePackage().Build(), SigningBlockBytes(pairs))).Warnings();
+  };
+  EXPECT_EQ(warnings({{kSchemeV2, own}}), Codes());
+  EXPECT_EQ(warnings({{kSchemeV2, other}, {kSchemeV2, own}}), Codes({"other-key"}));
+  EXPECT_EQ(warnings({{kSchemeV2, own}, {kSchemeV2, other}}), Codes());
+  EXPECT_EQ(warnings({{kSchemeV2, both}}), Codes({"other-key"}));
+}
+
+TEST(TwoFaces, SigningBlockThatIsTooLargeIsTold) {
+  Certificate certificate;
+  certificate.key = "rsa-2048-other";
+  const Bytes block = SigningBlockBytes(
+      {{7, Bytes(16 << 20, 0)}, {kSchemeV2, Signers({SignerBytes(certificate.Build())})}});
+  const Told told(ArchiveWithBlock(MakePackage().Build(), block));
+  EXPECT_EQ(told.Warnings(), Codes({"not-looked-into"}));
+  EXPECT_TRUE(
+      Has(told.head, "   ! the block of the schemes after v1 is too large to be looked into"))
+      << told.head;
+}
+
+// ---- Damage hides nothing.
+
+TEST(TwoFaces, DamagedEntryHidesNoOther) {
+  Package package = MakePackage();
+  package.items.push_back({"res/damaged", ToBytes("x")});
+  package.items.back().local.crc = 1;
+  package.items.push_back({"classes2.dex", ToBytes("another's")});
+  const Told told(package);
+  EXPECT_EQ(told.status, 0);
+  EXPECT_EQ(told.Warnings(), Codes({"entries-damaged", "unlisted-entries"}));
+  EXPECT_TRUE(
+      Has(told.text, "the archive is damaged at 1 entry: res/damaged, which nobody can read"));
+  EXPECT_TRUE(Has(told.text, "      not listed: classes2.dex\n")) << told.text;
+  const Told strict(package, {"--strict", "--install"});
+  EXPECT_EQ(strict.status, 1);
+  EXPECT_TRUE(Has(strict.head, "PARTLY SIGNED")) << strict.head;
+  EXPECT_TRUE(Has(strict.text, "  ✗ entries              the archive is damaged at 1 entry"))
+      << strict.text;
+}

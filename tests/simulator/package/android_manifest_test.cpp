@@ -1,0 +1,151 @@
+#include "simulator/package/android_manifest.h"
+
+#include <gtest/gtest.h>
+
+#include "support/compiled_manifest.h"
+
+using namespace simulator;
+
+namespace {
+
+XmlAttribute Boolean(const std::string& name, bool value) {
+  XmlAttribute attribute = IntAttribute(name, value ? 0xffffffff : 0);
+  attribute.type = 0x12;
+  return InAndroidNamespace(attribute);
+}
+
+constexpr CompiledXml::Pool kPools[] = {CompiledXml::Pool::kUtf8, CompiledXml::Pool::kUtf16};
+
+// What is read of a manifest whose application has these attributes.
+std::optional<bool> Extracts(const std::vector<XmlAttribute>& attributes,
+                             CompiledXml::Pool pool = CompiledXml::Pool::kUtf8) {
+  CompiledXml xml(pool);
+  xml.Start("manifest", {StringAttribute("package", "p")})
+      .Element("application", attributes)
+      .End("manifest");
+  return ParseAndroidManifest(xml.Build()).extracts_libraries;
+}
+
+}  // namespace
+
+TEST(AndroidManifestFacts, PackageNameInEitherEncoding) {
+  for (const auto pool : kPools) {
+    for (const std::string& name :
+         {std::string("com.example.\u00fc\u20ac\U0001f600"), std::string(300, 'n')}) {
+      CompiledXml xml(pool);
+      xml.Element("manifest", {StringAttribute("package", name)});
+      const AndroidManifest manifest = ParseAndroidManifest(xml.Build());
+      EXPECT_EQ(manifest.package_name, name);
+      EXPECT_EQ(manifest.installer_name, name);
+    }
+  }
+}
+
+// The tool takes the first attribute of the local name, the installer the one of no namespace.
+TEST(AndroidManifestFacts, PackageNameOfAnotherNamespaceIsTheToolsAlone) {
+  for (const auto pool : kPools) {
+    CompiledXml xml(pool);
+    xml.Element("manifest", {InAndroidNamespace(StringAttribute("package", "com.victim")),
+                             StringAttribute("package", "com.evil")});
+    const AndroidManifest manifest = ParseAndroidManifest(xml.Build());
+    EXPECT_EQ(manifest.package_name, "com.victim");
+    EXPECT_EQ(manifest.installer_name, "com.evil");
+  }
+}
+
+TEST(AndroidManifestFacts, PackageNameThatIsNoTextIsTheToolsToPassOver) {
+  const AndroidManifest manifest =
+      ParseAndroidManifest(CompiledXml().Element("manifest", {IntAttribute("package", 5)}).Build());
+  EXPECT_EQ(manifest.package_name, "");
+  EXPECT_EQ(manifest.installer_name, "");
+}
+
+TEST(AndroidManifestFacts, PackageNameOfAnElementInsideIsTheToolsAlone) {
+  CompiledXml xml;
+  xml.Start("manifest").Element("manifest", {StringAttribute("package", "p")}).End("manifest");
+  EXPECT_EQ(ParseAndroidManifest(xml.Build()).package_name, "p");
+  EXPECT_EQ(ParseAndroidManifest(xml.Build()).installer_name, "");
+}
+
+TEST(AndroidManifestFacts, WhetherLibrariesAreExtracted) {
+  for (const auto pool : kPools) {
+    EXPECT_EQ(Extracts({}, pool), std::nullopt);
+    EXPECT_EQ(Extracts({Boolean("extractNativeLibs", true)}, pool), true);
+    EXPECT_EQ(Extracts({Boolean("debuggable", true), Boolean("extractNativeLibs", false)}, pool),
+              false);
+    EXPECT_EQ(Extracts({StringAttribute("extractNativeLibs", "false")}, pool), std::nullopt);
+    EXPECT_EQ(Extracts({Boolean("extractNativeLibz", false)}, pool), std::nullopt);
+  }
+}
+
+// What an installer reads as a number is a truth value to it.
+TEST(AndroidManifestFacts, LibrariesAreExtractedForAnyNumberButZero) {
+  EXPECT_EQ(Extracts({IntAttribute("extractNativeLibs", 0)}), false);
+  EXPECT_EQ(Extracts({IntAttribute("extractNativeLibs", 7)}), true);
+  EXPECT_EQ(Extracts({ReferenceAttribute("extractNativeLibs", 0)}), std::nullopt);
+}
+
+TEST(AndroidManifestFacts, OfTwoApplicationsTheFirstCounts) {
+  CompiledXml xml;
+  xml.Start("manifest", {StringAttribute("package", "p")})
+      .Element("application", {Boolean("extractNativeLibs", true)})
+      .Element("application", {Boolean("extractNativeLibs", false)})
+      .End("manifest");
+  EXPECT_EQ(ParseAndroidManifest(xml.Build()).extracts_libraries, true);
+  CompiledXml other;
+  other.Start("manifest", {StringAttribute("package", "p")})
+      .Element("application")
+      .Element("application", {Boolean("extractNativeLibs", false)})
+      .End("manifest");
+  EXPECT_EQ(ParseAndroidManifest(other.Build()).extracts_libraries, std::nullopt);
+}
+
+TEST(AndroidManifestFacts, WhatDoesNotReadIsNotThere) {
+  EXPECT_EQ(ParseAndroidManifest({}).package_name, std::nullopt);
+  EXPECT_EQ(ParseAndroidManifest(ToBytes("<manifest package=\"p\"/>")).package_name, std::nullopt);
+  const Bytes whole = CompiledManifest("com.example.app", true);
+  for (size_t size = 0; size < whole.size(); ++size) {
+    const Bytes cut(whole.begin(), whole.begin() + static_cast<ptrdiff_t>(size));
+    EXPECT_EQ(ParseAndroidManifest(cut).package_name, std::nullopt) << size;
+    EXPECT_EQ(ParseAndroidManifest(cut).installer_name, "") << size;
+  }
+  EXPECT_EQ(ParseAndroidManifest(CompiledXml().Start("x").StartWithoutName().Build()).package_name,
+            "");
+  EXPECT_EQ(ParseAndroidManifest(CompiledXml().Start("manifest").BadNode().Build()).package_name,
+            "");
+}
+
+// All strings of the pool are made the longest one: 40 times as long together as the document.
+TEST(AndroidManifestFacts, DocumentWhoseStringsLieInOneAnotherIsNotRead) {
+  constexpr size_t kPool = 8;          // behind the document's header
+  constexpr size_t kOffsets = 8 + 28;  // behind the pool's
+  CompiledXml xml;
+  std::vector<XmlAttribute> attributes = {StringAttribute("package", std::string(5000, 'p'))};
+  for (int i = 0; i < 200; ++i) attributes.push_back(IntAttribute("a" + std::to_string(i), 0));
+  xml.Element("manifest", attributes);
+  Bytes bytes = xml.Build();
+  EXPECT_FALSE(ParseAndroidManifest(bytes).has_overlaps);
+  EXPECT_EQ(ParseAndroidManifest(bytes).installer_name, std::string(5000, 'p'));
+  // Which of the strings is the long one: its offset is followed by one that is 5000 more.
+  const auto number = [&bytes](size_t at) {
+    return bytes[at] | bytes[at + 1] << 8 | bytes[at + 2] << 16 | bytes[at + 3] << 24;
+  };
+  const int count = number(kPool + 8);
+  ASSERT_GT(count, 200);
+  int longest = 0;
+  for (int i = 0; i + 1 < count; ++i) {
+    const size_t at = kOffsets + 4 * static_cast<size_t>(i);
+    if (number(at + 4) - number(at) > 5000) longest = number(at);
+  }
+  ASSERT_NE(longest, 0);
+  for (int i = 0; i < count; ++i) {
+    for (size_t byte = 0; byte < 4; ++byte) {
+      bytes[kOffsets + 4 * static_cast<size_t>(i) + byte] =
+          static_cast<uint8_t>(longest >> (8 * byte));
+    }
+  }
+  const AndroidManifest manifest = ParseAndroidManifest(bytes);
+  EXPECT_TRUE(manifest.has_overlaps);
+  EXPECT_EQ(manifest.package_name, std::nullopt);
+  EXPECT_EQ(manifest.installer_name, "");
+}

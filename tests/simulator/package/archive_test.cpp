@@ -1,0 +1,194 @@
+#include "simulator/package/archive.h"
+
+#include <fcntl.h>
+#include <gtest/gtest.h>
+#include <sys/mman.h>
+#include <unistd.h>
+
+#include <csignal>
+
+#include "support/files.h"
+#include "support/zip.h"
+
+using namespace simulator;
+
+namespace {
+
+using Lines = std::vector<std::string>;
+
+// An entry that the platform's library does not find: its local header has another CRC.
+ZipItem Damaged(const std::string& name) {
+  ZipItem item = {name, ToBytes("data of " + name)};
+  item.local.crc = 1;
+  return item;
+}
+
+ZipItem Good(const std::string& name) { return {name, ToBytes("data of " + name)}; }
+
+// "name size", and "damaged" where the entry is.
+Lines EntriesOf(const Bytes& zip) {
+  const MemoryFile file(zip);
+  int32_t result = -1;
+  const Archive archive(file.fd(), &result);
+  EXPECT_EQ(result, 0);
+  Lines lines;
+  for (const ArchiveEntry& entry : archive.Entries()) {
+    lines.push_back(entry.name + " " + std::to_string(entry.size) +
+                    (entry.is_damaged ? " damaged" : ""));
+  }
+  return lines;
+}
+
+ArchiveWalk WalkOf(const Bytes& zip) {
+  const MemoryFile file(zip);
+  int32_t result = -1;
+  const Archive archive(file.fd(), &result);
+  return archive.Walk(kLibraryNames);
+}
+
+}  // namespace
+
+TEST(Archive, EntriesAreThoseOfTheDirectoryInItsOrder) {
+  EXPECT_EQ(EntriesOf(BuildZip({Good("b"), Good("a"), Good("\x01\u00e9")})),
+            Lines({"b 9", "a 9", "\x01\u00e9 11"}));
+}
+
+TEST(Archive, DamagedEntryIsNamedAndEndsNothing) {
+  EXPECT_EQ(EntriesOf(BuildZip({Good("a"), Damaged("b"), Good("c")})),
+            Lines({"a 9", "b 9 damaged", "c 9"}));
+}
+
+// The order of the walk is the library's own, so each place of the damaged entry is tried.
+TEST(Archive, WalkTellsWhereTheToolsEnds) {
+  const Lines names = {"lib/x/a.so", "lib/x/b.so", "lib/x/c.so"};
+  const Lines order = WalkOf(BuildZip({Good(names[0]), Good(names[1]), Good(names[2])})).names;
+  ASSERT_EQ(order.size(), 3U);
+  for (size_t damaged = 0; damaged < 3; ++damaged) {
+    std::vector<ZipItem> items = {Good("res/a"), Damaged("res/b")};
+    for (const std::string& name : names) {
+      items.push_back(name == order[damaged] ? Damaged(name) : Good(name));
+    }
+    const ArchiveWalk walk = WalkOf(BuildZip(items));
+    Lines expected = order;
+    expected.erase(expected.begin() + static_cast<ptrdiff_t>(damaged));
+    EXPECT_EQ(walk.names, expected);
+    EXPECT_EQ(walk.met, damaged);
+  }
+  EXPECT_EQ(WalkOf(BuildZip({Good("res/a"), Damaged("res/b")})).names, Lines());
+}
+
+TEST(Archive, WalkWithoutDamageIsMetWhole) {
+  EXPECT_EQ(WalkOf(BuildZip({Good("lib/x/a.so"), Good("lib/x/b.so")})).met, 2U);
+}
+
+TEST(Archive, ReadsWhatTheToolExtracts) {
+  ZipItem deflated = Good("deflated");
+  deflated.deflated = true;
+  const MemoryFile file(
+      BuildZip({deflated, Damaged("damaged"), ClaimingLength(Good("lying"), 0xfffffff0)}));
+  int32_t result = -1;
+  Archive archive(file.fd(), &result);
+  std::vector<uint8_t> content = ToBytes("before");
+  EXPECT_EQ(archive.Read("none", &content), Archive::ReadResult::kMissing);
+  EXPECT_EQ(archive.Read(std::string(65536, 'n'), &content), Archive::ReadResult::kMissing);
+  EXPECT_EQ(archive.Read("damaged", &content), Archive::ReadResult::kDamaged);
+  EXPECT_EQ(archive.Read("lying", &content), Archive::ReadResult::kDamaged);
+  EXPECT_EQ(content, ToBytes("before"));
+  EXPECT_EQ(archive.Read("deflated", &content), Archive::ReadResult::kRead);
+  EXPECT_EQ(content, ToBytes("data of deflated"));
+  EXPECT_TRUE(archive.Has("damaged"));
+  EXPECT_FALSE(archive.Has("none"));
+  EXPECT_FALSE(archive.Has(std::string(65536, 'n')));
+}
+
+TEST(Archive, LongEntriesAreNotRead) {
+  ZipItem longest = {"longest", Bytes(Archive::kLongestRead, 'a'), true};
+  ZipItem longer = {"longer", Bytes(Archive::kLongestRead + 1, 'a'), true};
+  const MemoryFile file(BuildZip({longest, longer}));
+  int32_t result = -1;
+  Archive archive(file.fd(), &result);
+  std::vector<uint8_t> content;
+  EXPECT_EQ(archive.Read("longer", &content), Archive::ReadResult::kTooLong);
+  EXPECT_EQ(archive.too_long(), Lines({"longer"}));
+  EXPECT_TRUE(content.empty());
+  EXPECT_EQ(archive.Read("longest", &content), Archive::ReadResult::kRead);
+  EXPECT_EQ(content.size(), Archive::kLongestRead);
+}
+
+// The directory is mapped; its pages behind the new end are gone.
+TEST(Archive, SurvivesAFileThatShrinks) {
+  std::vector<ZipItem> items;
+  for (int i = 0; i < 2000; ++i) items.push_back({"assets/" + std::to_string(i), {}});
+  const TempDir folder;
+  const std::string path = folder.Write("a.zip", BuildZip(items));
+  const int fd = open(path.c_str(), O_RDONLY);
+  int32_t result = -1;
+  {
+    const Archive archive(fd, &result);
+    ASSERT_EQ(result, 0);
+    EXPECT_EQ(archive.Entries().size(), 2000U);
+    EXPECT_FALSE(archive.HasShrunk());
+    ASSERT_EQ(truncate(path.c_str(), 10), 0);
+    EXPECT_TRUE(archive.Entries().empty());
+    EXPECT_EQ(archive.Walk(kAllNames).met, 0U);
+    EXPECT_TRUE(archive.HasShrunk());
+  }
+  close(fd);
+  // The next one starts anew.
+  const MemoryFile other(BuildZip({Good("a")}));
+  const Archive archive(other.fd(), &result);
+  EXPECT_FALSE(archive.HasShrunk());
+}
+
+// Any other SIGBUS ends the process as it always has.
+TEST(ShrinkGuardDeathTest, GuardsItsOwnTimeAlone) {
+  const auto touch = [](bool guarded) {
+    const int fd = memfd_create("page", MFD_CLOEXEC);
+    volatile char* const page =
+        static_cast<char*>(mmap(nullptr, 4096, PROT_READ, MAP_SHARED, fd, 0));
+    { const ShrinkGuard before; }
+    if (guarded) {
+      const ShrinkGuard guard;
+      const bool is_zero = *page == 0 && guard.HasShrunk();
+      _exit(is_zero ? 0 : 1);
+    }
+    _exit(*page);
+  };
+  EXPECT_EXIT(touch(true), testing::ExitedWithCode(0), "");
+  EXPECT_EXIT(touch(false), testing::KilledBySignal(SIGBUS), "");
+}
+
+TEST(ArchiveEnd, IsTheLastMarkThatHasRoomForARecord) {
+  const auto end_of = [](const std::string& comment) {
+    Bytes zip = BuildZip({Good("a")});
+    zip[zip.size() - 2] = static_cast<uint8_t>(comment.size());
+    zip.insert(zip.end(), comment.begin(), comment.end());
+    const MemoryFile file(zip);
+    const auto end = FindArchiveEnd(file.fd());
+    return end ? static_cast<int>(end->entry_count) : -1;
+  };
+  EXPECT_EQ(end_of(""), 1);
+  EXPECT_EQ(end_of("a comment"), 1);
+  // A mark in the comment that no record follows is no end.
+  EXPECT_EQ(end_of(std::string("PK\5\6") + std::string(17, '\0')), 1);
+  // With one behind it the platform's library takes it for the end, and so is it taken here.
+  EXPECT_EQ(end_of(std::string("PK\5\6") + std::string(18, '\0')), 0);
+}
+
+TEST(ArchiveEnd, MayLieAboutItsDirectory) {
+  Bytes zip = BuildZip({Good("a")});
+  zip[zip.size() - 22 + 19] = 0xff;  // the highest byte of the directory's offset
+  const MemoryFile file(zip);
+  const auto end = FindArchiveEnd(file.fd());
+  ASSERT_TRUE(end.has_value());
+  EXPECT_GT(end->directory_offset, zip.size());
+  EXPECT_TRUE(ReadDirectory(file.fd(), *end).empty());
+}
+
+TEST(ArchiveEnd, OfWhatIsNoArchiveIsNone) {
+  const MemoryFile empty({});
+  EXPECT_FALSE(FindArchiveEnd(empty.fd()).has_value());
+  const MemoryFile text(ToBytes("no archive, but long enough to hold the record of an end"));
+  EXPECT_FALSE(FindArchiveEnd(text.fd()).has_value());
+  EXPECT_FALSE(FindArchiveEnd(-1).has_value());
+}

@@ -1,0 +1,117 @@
+#include "simulator/show/words.h"
+
+#include <gtest/gtest.h>
+
+using namespace simulator;
+
+namespace {
+
+Item Library(const Cause* why) {
+  return {ItemKind::kLibrary, "lib/arm64/a.so", "", ItemState::kRefused, {why, ""}};
+}
+
+}  // namespace
+
+TEST(Summary, CountsEachVerdict) {
+  EXPECT_EQ(Summary({Verdict::kSigned, Verdict::kRefused, Verdict::kSigned, Verdict::kNotLookedAt}),
+            "4 files: 2 signed, 1 refused, 1 not looked at");
+  EXPECT_EQ(Summary({Verdict::kTrustedJar}), "1 file: 1 trusted JAR");
+  const std::vector<Verdict> all = {
+      Verdict::kSigned,        Verdict::kTrustedJar,  Verdict::kPartlySigned, Verdict::kRefused,
+      Verdict::kNotTrustedJar, Verdict::kNotLookedAt, Verdict::kNotSimulated};
+  std::vector<Verdict> twice = all;
+  twice.insert(twice.end(), all.begin(), all.end());
+  EXPECT_EQ(
+      Summary(all),
+      "7 files: 1 signed, 1 trusted JAR, 1 partly signed, 1 refused, 1 JAR not trusted, 1 not "
+      "looked at, 1 not simulated");
+  EXPECT_EQ(Summary(twice),
+            "14 files: 2 signed, 2 trusted JARs, 2 partly signed, 2 refused, 2 JARs not trusted, 2 "
+            "not looked at, 2 not simulated");
+  EXPECT_EQ(Summary({}), "0 files");
+}
+
+TEST(Words, SayWhatToDoOnceForNeighboursThatNeedTheSame) {
+  const Item changed = Library(&cause::kLibraryChanged);
+  const Item refused = Library(&cause::kKernelRefused);
+  EXPECT_TRUE(HasCure(changed, nullptr));
+  EXPECT_TRUE(HasCure(changed, &refused));
+  EXPECT_FALSE(HasCure(changed, &changed));
+}
+
+TEST(Words, SayNothingToDoForWhatFollowsFromAnother) {
+  EXPECT_FALSE(HasCure(Library(&cause::kPackageRefused), nullptr));
+  EXPECT_FALSE(HasCure(Library(&cause::kNotReached), nullptr));
+  Item nothing = Library(&cause::kLibraryOtherAbi);
+  nothing.state = ItemState::kNothing;
+  EXPECT_FALSE(HasCure(nothing, nullptr));
+}
+
+namespace {
+
+using Lines = std::vector<std::string>;
+
+Report WithSigner() {
+  Report report;
+  report.package_name = "com.app";
+  report.signer.emplace();
+  report.signer->subject = "CN=a";
+  report.signer->key = {"RSA", 512, "spki", "0123456789abcdef"};
+  return report;
+}
+
+}  // namespace
+
+TEST(HeadFacts, NameTheSignerAndTheKernelsKey) {
+  Report report = WithSigner();
+  EXPECT_EQ(HeadFacts(report, "..."), Lines({"com.app", "signer CN=a, RSA-512"}));
+  report.key = {"98302ce800f64646", 2048, true};
+  EXPECT_EQ(HeadFacts(report, "..."),
+            Lines({"com.app", "signer CN=a, RSA-2048, key 98302ce8...f64646"}));
+  report.key->bits = 0;
+  EXPECT_EQ(HeadFacts(report, "…")[1], "signer CN=a, RSA, key 98302ce8…f64646");
+  report.signer.reset();
+  report.package_name = "";
+  EXPECT_EQ(HeadFacts(report, "..."), Lines({"signer unknown, RSA, key 98302ce8...f64646"}));
+  report.key.reset();
+  EXPECT_EQ(HeadFacts(report, "..."), Lines());
+}
+
+TEST(HeadFacts, OfAnUnknownAlgorithmHaveItsNameAlone) {
+  Report report = WithSigner();
+  report.signer->key = {"1.2.3", 0, "spki", ""};
+  EXPECT_EQ(HeadFacts(report, "...")[1], "signer CN=a, 1.2.3");
+}
+
+TEST(HeadFacts, SoundTheAlarmsAndNoOtherWarnings) {
+  Report report;
+  report.warnings = {{&cause::kUnlistedEntries, "x"}, {&cause::kBlockAmbiguous, "why"}};
+  EXPECT_EQ(HeadFacts(report, "..."),
+            Lines({"! others may read another signer in its signature block than the tool does: "
+                   "why"}));
+}
+
+TEST(SignerRows, SayOfTheKeyWhatTheKernelGot) {
+  Report report = WithSigner();
+  EXPECT_EQ(SignerRows(report).back(),
+            Rows::value_type("modulus SHA-256 digest", "0123456789abcdef (of the modulus alone)"));
+  report.key = {"98302ce8", 2048, true};
+  EXPECT_EQ(SignerRows(report).size(), 6U);
+  EXPECT_EQ(SignerRows(report)[5],
+            Rows::value_type("modulus SHA-256 digest",
+                             "98302ce8 (of the modulus alone: what the kernel got)"));
+  report.key->was_got = false;
+  EXPECT_EQ(SignerRows(report)[5].second, "98302ce8 (of the modulus alone, as the tool reads it)");
+  // A certificate in which others read no key is shown all the same, and so is the key alone.
+  report.signer->key = {"RSA", 0, "spki", ""};
+  EXPECT_EQ(SignerRows(report).size(), 5U);
+  EXPECT_EQ(SignerRows(report)[3].first, "public key SHA-256 digest");
+  report.signer.reset();
+  EXPECT_EQ(SignerRows(report).size(), 1U);
+}
+
+TEST(Words, LinkBeyondABreakSaysNothingOfItself) {
+  EXPECT_EQ(TextOf(Link{"manifest", LinkState::kHolds, "text"}), "text");
+  EXPECT_EQ(TextOf(Link{"manifest", LinkState::kBroken, "why"}), "why");
+  EXPECT_EQ(TextOf(Link{"manifest", LinkState::kNotReached, "text"}), "not reached");
+}

@@ -1,0 +1,235 @@
+#include "simulator/verdict/parts.h"
+
+#include <gtest/gtest.h>
+
+using namespace simulator;
+
+namespace {
+
+const std::string kModulus(64, 'a');
+const std::string kOther(64, 'b');
+
+CertificateFacts CertificateWith(const std::string& subject, const std::string& modulus,
+                                 const std::string& key) {
+  CertificateFacts certificate;
+  certificate.subject = subject;
+  certificate.issuer = "CN=issuer";
+  certificate.key = {"RSA", 2048, key, modulus};
+  return certificate;
+}
+
+const CertificateFacts kJarSigner = CertificateWith("CN=jar", kModulus, "jar key");
+
+// A package of which there is nothing to say.
+PackageFacts Good() {
+  PackageFacts facts;
+  facts.jar.manifest = Archive::ReadResult::kRead;
+  facts.jar.signature_files = {"META-INF/CERT.SF"};
+  facts.jar.key = ToolKey{kModulus, 256, 2048, 65537, false};
+  facts.jar.block.is_whole = true;
+  facts.jar.block.signer_count = 1;
+  facts.jar.certificate = kJarSigner;
+  facts.manifest.package_name = facts.manifest.installer_name = "com.app";
+  return facts;
+}
+
+Report ReportOf(const PackageFacts& facts, ItemKind kind = ItemKind::kPackage) {
+  Report report;
+  report.items = {{kind, "package", "", ItemState::kDone, {}}};
+  report.signer = facts.jar.certificate;
+  report.key = {kModulus, 2048, true};
+  return report;
+}
+
+std::vector<std::string> Warnings(const PackageFacts& facts, const Report& report,
+                                  const RunRecord& run = {}) {
+  std::vector<std::string> lines;
+  for (const Reason& warning : FindWarnings(run, facts, report)) {
+    lines.push_back(std::string(warning.cause->code) + ": " + warning.detail);
+  }
+  return lines;
+}
+
+std::vector<std::string> Warnings(const PackageFacts& facts) {
+  return Warnings(facts, ReportOf(facts));
+}
+
+using Lines = std::vector<std::string>;
+
+}  // namespace
+
+TEST(Warnings, GoodPackageHasNone) { EXPECT_EQ(Warnings(Good()), Lines()); }
+
+// ---- What others read is not what the tool reads.
+
+TEST(Warnings, CertificateThatShowsAnotherKeyThanTheKernelGets) {
+  PackageFacts facts = Good();
+  facts.jar.certificate->key.modulus_sha256 = kOther;
+  EXPECT_EQ(Warnings(facts), Lines({"certificate-other-key: modulus SHA-256 digest: " + kOther}));
+  facts.jar.certificate->key.modulus_sha256 = "";
+  EXPECT_EQ(Warnings(facts), Lines({"certificate-other-key: none that others read"}));
+  EXPECT_EQ(cause::kCertificateOtherKey.severity, Severity::kAlarm);
+}
+
+// The key that the kernel got counts, and not the one that the file shows by now.
+TEST(Warnings, KernelThatGotAnotherKeyThanTheCertificateShows) {
+  Report report = ReportOf(Good());
+  report.key->sha256 = kOther;
+  EXPECT_EQ(Warnings(Good(), report),
+            Lines({"certificate-other-key: modulus SHA-256 digest: " + kModulus}));
+}
+
+TEST(Warnings, WithoutAKeyThereIsNoneToDifferFrom) {
+  PackageFacts facts = Good();
+  facts.jar.key.reset();
+  facts.jar.block.is_whole = false;
+  Report report = ReportOf(facts);
+  report.key.reset();
+  EXPECT_EQ(Warnings(facts, report), Lines());
+}
+
+TEST(Warnings, BlockThatOthersReadInAnotherWay) {
+  PackageFacts facts = Good();
+  facts.jar.block.is_whole = false;
+  EXPECT_EQ(Warnings(facts), Lines({"block-ambiguous: it is not encoded strictly"}));
+  facts = Good();
+  facts.jar.certificate.reset();
+  EXPECT_EQ(Warnings(facts), Lines({"block-ambiguous: it is not encoded strictly"}));
+  facts = Good();
+  facts.jar.names_other_certificate = true;
+  EXPECT_EQ(Warnings(facts),
+            Lines({"block-ambiguous: it names another certificate than its first"}));
+  EXPECT_EQ(cause::kBlockAmbiguous.severity, Severity::kAlarm);
+}
+
+TEST(Warnings, PackageNameThatTheInstallerReadsInAnotherWay) {
+  PackageFacts facts = Good();
+  facts.manifest.installer_name = "com.evil";
+  EXPECT_EQ(Warnings(facts), Lines({"other-package-name: \"com.evil\""}));
+  facts.manifest.package_name.reset();
+  EXPECT_EQ(Warnings(facts), Lines());
+}
+
+// ---- Signers.
+
+TEST(Warnings, SeveralSigners) {
+  PackageFacts facts = Good();
+  facts.jar.block.signer_count = 2;
+  EXPECT_EQ(Warnings(facts), Lines({"several-signers: META-INF/CERT.SF"}));
+  facts = Good();
+  facts.jar.signature_files.push_back("META-INF/OTHER.SF");
+  EXPECT_EQ(Warnings(facts), Lines({"several-signers: META-INF/CERT.SF"}));
+}
+
+TEST(Warnings, ForgeableKeyIsNotSaidTwice) {
+  PackageFacts facts = Good();
+  facts.jar.key->is_forgeable = true;
+  facts.jar.key->exponent = -1;
+  EXPECT_EQ(Warnings(facts), Lines({"forgeable-key: -1"}));
+  Report report = ReportOf(facts);
+  report.items[0].reason.cause = &cause::kExponentRefused;
+  EXPECT_EQ(Warnings(facts, report), Lines());
+}
+
+TEST(Warnings, OtherKeyOfAnyNewerSigner) {
+  PackageFacts facts = Good();
+  const CertificateFacts other = CertificateWith("CN=other", kOther, "other key");
+  facts.newer = {{"v2", kJarSigner}, {"v3", kJarSigner}};
+  EXPECT_EQ(Warnings(facts), Lines());
+  const std::string told = "signature (CN=other, public key SHA-256 digest: other key)";
+  facts.newer = {{"v2", kJarSigner}, {"v2", other}};
+  EXPECT_EQ(Warnings(facts), Lines({"other-key: the v2 " + told}));
+  facts.newer = {{"v2", other}, {"v2", kJarSigner}, {"v3", other}};
+  EXPECT_EQ(Warnings(facts), Lines({"other-key: the v2 " + told, "other-key: the v3 " + told}));
+}
+
+// The same modulus with another exponent is another key, and so is the key of the certificate where
+// the kernel gets another.
+TEST(Warnings, OtherKeyWithAPartOfTheJarSigners) {
+  PackageFacts facts = Good();
+  facts.newer = {{"v2", CertificateWith("CN=other", kModulus, "other key")}};
+  EXPECT_EQ(Warnings(facts).size(), 1U);
+  facts.newer = {{"v2", CertificateWith("CN=other", kOther, "jar key")}};
+  EXPECT_EQ(Warnings(facts).size(), 1U);
+  // Without a certificate that reads, the kernel's key is all there is to compare.
+  facts.jar.certificate.reset();
+  facts.newer = {{"v2", CertificateWith("CN=other", kOther, "jar key")}};
+  EXPECT_EQ(Warnings(facts).size(), 2U);
+  facts.newer = {{"v2", CertificateWith("CN=other", kModulus, "jar key")}};
+  EXPECT_EQ(Warnings(facts).size(), 1U);
+}
+
+TEST(Warnings, OtherKeyThanAnEcSigners) {
+  PackageFacts facts = Good();
+  facts.jar.key.reset();
+  facts.jar.certificate->key = {"EC", 256, "ec key", ""};
+  facts.newer = {{"v2", *facts.jar.certificate}};
+  Report report = ReportOf(facts);
+  report.key.reset();
+  EXPECT_EQ(Warnings(facts, report), Lines());
+  facts.newer = {{"v2", kJarSigner}};
+  EXPECT_EQ(Warnings(facts, report).size(), 1U);
+  report.signer.reset();
+  EXPECT_EQ(Warnings(facts, report), Lines());
+}
+
+TEST(Warnings, SchemesThatWereStripped) {
+  PackageFacts facts = Good();
+  facts.jar.claimed_schemes = "2, 3";
+  EXPECT_EQ(Warnings(facts), Lines({"schemes-stripped: v2, v3"}));
+  facts.newer = {{"v3", kJarSigner}};
+  EXPECT_EQ(Warnings(facts), Lines({"schemes-stripped: v2"}));
+  facts.newer = {{"v2", kJarSigner}};
+  EXPECT_EQ(Warnings(facts), Lines({"schemes-stripped: v3"}));
+  facts.newer = {{"v2", kJarSigner}, {"v3", kJarSigner}};
+  EXPECT_EQ(Warnings(facts), Lines());
+}
+
+// ---- The file.
+
+TEST(Warnings, FileThatChangedOrIsNotLookedInto) {
+  PackageFacts facts = Good();
+  facts.was_changed = true;
+  facts.has_damaged_signing_block = true;
+  facts.too_long = {"a", "b"};
+  const Lines expected = {"file-changed: ", "signing-block-damaged: ", "not-looked-into: a",
+                          "not-looked-into: b"};
+  EXPECT_EQ(Warnings(facts), expected);
+  EXPECT_EQ(Warnings(facts, ReportOf(facts, ItemKind::kJar)), expected);
+}
+
+TEST(Warnings, EntriesThatAreNotListedOrDamaged) {
+  PackageFacts facts = Good();
+  facts.entries = {{{"listed", 1, false}, true, false},
+                   {{"META-INF/A.SF", 10, false}, false, true},
+                   {{"added", 100, false}, false, false}};
+  EXPECT_EQ(Warnings(facts), Lines({"unlisted-entries: 1 entry (100 bytes)"}));
+  facts.entries.push_back({{"lost", 1000, true}, false, false});
+  EXPECT_EQ(Warnings(facts),
+            Lines({"entries-damaged: 1 entry: lost", "unlisted-entries: 2 entries (1100 bytes)"}));
+  // Without a manifest nothing says what is listed.
+  facts.jar.manifest = Archive::ReadResult::kMissing;
+  EXPECT_EQ(Warnings(facts), Lines({"entries-damaged: 1 entry: lost"}));
+  facts.entries = {{{"added", 1, false}, false, false}};
+  facts.jar.manifest = Archive::ReadResult::kRead;
+  EXPECT_EQ(Warnings(facts), Lines({"unlisted-entries: 1 entry (1 byte)"}));
+}
+
+TEST(Warnings, NamesThatInstallersDoNotTake) {
+  RunRecord run;
+  run.not_laid_out = {"lib/a.so"};
+  EXPECT_EQ(Warnings(Good(), ReportOf(Good()), run), Lines({"not-laid-out: 1 entry: lib/a.so"}));
+  run.not_laid_out.emplace_back("lib/b.so");
+  EXPECT_EQ(Warnings(Good(), ReportOf(Good()), run),
+            Lines({"not-laid-out: 2 entries: lib/a.so, ..."}));
+}
+
+TEST(Warnings, OfAJarAreNotThoseOfAPackage) {
+  PackageFacts facts = Good();
+  facts.jar.certificate->key.modulus_sha256 = kOther;
+  facts.jar.block.signer_count = 2;
+  facts.jar.claimed_schemes = "2";
+  facts.entries = {{{"added", 1, true}, false, false}};
+  facts.manifest.installer_name = "x";
+  EXPECT_EQ(Warnings(facts, ReportOf(facts, ItemKind::kJar)), Lines());
+}
