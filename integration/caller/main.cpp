@@ -3,8 +3,8 @@
 // signers (SignerDigests.java); what came of each is printed. DIRECTORY is where the programs lie:
 // /system/bin.
 //
-// What the kernel trusts already is passed over, so that a run that was cut off goes on where it
-// was. The exit status: 0 all are trusted, 1 some are not, 2 the command line or the list is wrong.
+// It passes over files that the kernel trusts already. A run that was cut off can be started again.
+// The exit status: 0 all are trusted, 1 some are not, 2 the command line or the list is wrong.
 #include <algorithm>
 #include <cerrno>
 #include <cstdio>
