@@ -5,6 +5,7 @@ try-on-phone with a stand-in for adb (tests/phone/adb), on phones that work and 
 PROGRAMS is the directory of the built programs, GOLDEN that of the golden packages.
 """
 
+import datetime
 import os
 import pathlib
 import re
@@ -89,14 +90,19 @@ def modules_of(path, kind):
 
 
 def check_metadata():
-    """The form, and the version."""
+    """The form, and version and day of the newest heading in CHANGES.md."""
     with (ROOT / "METADATA").open() as metadata:
         result = subprocess.run(["protoc", f"--proto_path={HERE}", "--encode=Metadata",
                                  HERE / "metadata.proto"], stdin=metadata, capture_output=True, check=False)
     if result.returncode != 0:
         return [f"METADATA: {result.stderr.decode()}"]
-    version = re.search(r"project\(apktoolkit VERSION (\S+)", (ROOT / "CMakeLists.txt").read_text())[1]
-    return [] if f'version: "{version}"' in (ROOT / "METADATA").read_text() else ["METADATA: the version"]
+    heading = re.search(r"^## ([\d.]+), (?:in preparation since )?(.*)$",
+                        (ROOT / "CHANGES.md").read_text(), re.M)
+    day = datetime.datetime.strptime(heading[2], "%d %B %Y")
+    text = (ROOT / "METADATA").read_text()
+    wanted = (f'version: "{heading[1]}"',
+              f"last_upgrade_date {{ year: {day.year} month: {day.month} day: {day.day} }}")
+    return [f"METADATA does not have {line}" for line in wanted if line not in text]
 
 
 def trial(programs, package, mood=""):
