@@ -85,6 +85,45 @@ TEST(EntryDigests, OfManyEqualNamesTheLastSectionCounts) {
   EXPECT_EQ("SHA-256-Digest 0", recorded.Of("z"));
 }
 
+// The hash of a name turns by 5 bits before each letter. After 64 letters it is where it was, and
+// so names that have the same letters there share a hash, in whatever order these are.
+std::string With64Between(const std::string& letters) {
+  std::string name;
+  for (const char letter : letters) name += letter + std::string(63, '/');
+  return name;
+}
+
+// Which of the names share one: all, some, those next to one another. "b" and "A" make
+// 0x62 << 5 ^ 0x41, "c" and "a" 0x63 << 5 ^ 0x61, both 0xc01.
+TEST(EntryDigests, NamesThatShareAHashAreToldApart) {
+  const std::vector<std::string> families[] = {
+      {With64Between("abc"), With64Between("acb"), With64Between("bac"), With64Between("bca"),
+       With64Between("cab")},
+      {With64Between("abc"), "abc", With64Between("bac"), "bac", With64Between("cba")},
+      {"bA", "ca", "d", With64Between("xy"), With64Between("yx")}};
+  const std::string order = "bdacbaecdab";
+  for (const std::vector<std::string>& names : families) {
+    std::string sections;
+    const auto name_of = [&](char letter) { return names[static_cast<size_t>(letter - 'a')]; };
+    for (size_t i = 0; i < order.size(); ++i)
+      sections += Section(name_of(order[i]), std::to_string(i));
+    const Recorded recorded(sections);
+    for (const char letter : std::string("abcde")) {
+      EXPECT_EQ("SHA-256-Digest " + std::to_string(order.rfind(letter)),
+                recorded.Of(name_of(letter)));
+    }
+  }
+}
+
+TEST(EntryDigests, ANameThatOnlySharesAHashHasNoDigest) {
+  const Recorded recorded(Section("d", "1") + Section("ca", "2") +
+                          Section(With64Between("cba"), "3") + Section(With64Between("abc"), "4"));
+  for (const std::string& name : {std::string("bA"), With64Between("acb"), With64Between("bac"),
+                                  With64Between("cab"), With64Between("bca")}) {
+    EXPECT_EQ("none", recorded.Of(name)) << name;
+  }
+}
+
 TEST(EntryDigests, ALaterSectionWithoutADigestReplacesNothing) {
   EXPECT_EQ("SHA-256-Digest 1", Recorded(Section("a", "1") + "Name: a\r\nX: 2\r\n\r\n").Of("a"));
 }
