@@ -103,8 +103,8 @@ TEST(JarSignatureFacts, CertificateThatTheToolDoesNotReadIsNotShown) {
   const auto at = std::search(block.begin(), block.end(), certificate.begin(), certificate.end());
   ASSERT_NE(at, block.end());
   // A0 82 hh ll becomes A0 83 00 hh ll, and what is around it is as long as it says no more.
-  block.insert(at - 2, 0);
-  *(at - 3) = 0x83;
+  const auto inserted = block.insert(at - 2, 0);
+  *(inserted - 1) = 0x83;
   const JarSignatureFacts jar = SignatureOf(package);
   EXPECT_FALSE(jar.block.is_whole);
   EXPECT_FALSE(jar.certificate.has_value());
