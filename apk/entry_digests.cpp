@@ -16,7 +16,7 @@ ManifestMf::Section::value_type DigestOf(const ManifestMf::Section& section) {
 // product may build with a trap for that.
 size_t Hash(std::string_view name) {
   size_t hash = 0;
-  for (const char c : name) hash = (hash << 5 | hash >> 59) ^ static_cast<uint8_t>(c);
+  for (const char c : name) hash = (hash << 9 | hash >> 55) ^ static_cast<uint8_t>(c);
   return hash;
 }
 

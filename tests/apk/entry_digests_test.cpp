@@ -85,7 +85,7 @@ TEST(EntryDigests, OfManyEqualNamesTheLastSectionCounts) {
   EXPECT_EQ("SHA-256-Digest 0", recorded.Of("z"));
 }
 
-// The hash of a name turns by 5 bits before each letter. After 64 letters it is where it was, and
+// The hash of a name turns by 9 bits before each letter. After 64 letters it is where it was, and
 // so names that have the same letters there share a hash, in whatever order these are.
 std::string With64Between(const std::string& letters) {
   std::string name;
@@ -93,14 +93,15 @@ std::string With64Between(const std::string& letters) {
   return name;
 }
 
-// Which of the names share one: all, some, those next to one another. "b" and "A" make
-// 0x62 << 5 ^ 0x41, "c" and "a" 0x63 << 5 ^ 0x61, both 0xc01.
+// Which of the names share one: all, some, those next to one another. A byte that seven others
+// follow was rotated by 63 bits to the left, so an even one by one to the right. "b" and "q" make
+// 0x31 ^ 0x71, "d" and "r" 0x32 ^ 0x72, both 0x40.
 TEST(EntryDigests, NamesThatShareAHashAreToldApart) {
   const std::vector<std::string> families[] = {
       {With64Between("abc"), With64Between("acb"), With64Between("bac"), With64Between("bca"),
        With64Between("cab")},
       {With64Between("abc"), "abc", With64Between("bac"), "bac", With64Between("cba")},
-      {"bA", "ca", "d", With64Between("xy"), With64Between("yx")}};
+      {"b123456q", "d123456r", "e", With64Between("xy"), With64Between("yx")}};
   const std::string order = "bdacbaecdab";
   for (const std::vector<std::string>& names : families) {
     std::string sections;
@@ -116,10 +117,11 @@ TEST(EntryDigests, NamesThatShareAHashAreToldApart) {
 }
 
 TEST(EntryDigests, ANameThatOnlySharesAHashHasNoDigest) {
-  const Recorded recorded(Section("d", "1") + Section("ca", "2") +
+  const Recorded recorded(Section("d", "1") + Section("d123456r", "2") +
                           Section(With64Between("cba"), "3") + Section(With64Between("abc"), "4"));
-  for (const std::string& name : {std::string("bA"), With64Between("acb"), With64Between("bac"),
-                                  With64Between("cab"), With64Between("bca")}) {
+  for (const std::string& name :
+       {std::string("b123456q"), With64Between("acb"), With64Between("bac"), With64Between("cab"),
+        With64Between("bca")}) {
     EXPECT_EQ("none", recorded.Of(name)) << name;
   }
 }
