@@ -35,7 +35,7 @@ constexpr struct {
              {"arm64", InstalledAbi::kArm64},
              {"arm", InstalledAbi::kArm}};
 
-std::vector<std::string> WordsOf(int argc, char** argv);
+std::vector<std::string> CommandLineOf(int argc, char** argv);
 void AddPhone(CLI::App* app, Options* options);
 void AddKernelAnswer(CLI::App* app, const char* name, int* error, const char* description);
 void AddInstallation(CLI::App* app, Options* options);
@@ -67,7 +67,7 @@ std::optional<int> ParseOptions(int argc, char** argv, Options* options) {
   app.set_help_flag("-h,--help", "Print this help");
   app.set_version_flag("--version", "apktoolkit-sim " APKTOOLKIT_VERSION, "Print the version");
   try {
-    app.parse(WordsOf(argc, argv));
+    app.parse(CommandLineOf(argc, argv));
   } catch (const CLI::RequiredError& error) {
     if (const auto status = NameUnknownOption(app)) return status;
     app.exit(error);
@@ -89,7 +89,7 @@ namespace {
 
 // The command line as CLI11 takes it, from the back, with the value that an --install without one
 // stands for: the word after it is a file.
-std::vector<std::string> WordsOf(int argc, char** argv) {
+std::vector<std::string> CommandLineOf(int argc, char** argv) {
   std::vector<std::string> words(argv + std::min(argc, 1), argv + argc);
   const auto end_of_options = std::find(words.begin(), words.end(), "--");
   std::replace(words.begin(), end_of_options, std::string(kInstall),

@@ -3,6 +3,8 @@
 #include <sys/stat.h>
 #include <unistd.h>
 
+#include <chrono>
+
 #include "simulator/simulated.h"
 #include "support/package.h"
 
@@ -56,9 +58,12 @@ TEST(ExitStatus, FourWhenStandardInputIsClosed) {
   EXPECT_NE(result.output.find("standard input is closed"), std::string::npos) << result.output;
 }
 
+// Not even when it is asked to.
 TEST(ExitStatus, ThreeWhenTheToolDoesNotEnd) {
-  const Probe probe({"sign 3 0100ab", "sleep 60"});
+  const Probe probe({"sign 3 0100ab", "ignore 15", "sleep 60"});
+  const auto start = std::chrono::steady_clock::now();
   const ProbeRun run = probe.Run({"--timeout", "3"});
+  EXPECT_LT(std::chrono::steady_clock::now() - start, std::chrono::seconds(30));
   EXPECT_EQ(run.status, 3);
   EXPECT_EQ(run.errors, "apktoolkit-sim: " + probe.path() +
                             ": it was still busy after 3 seconds and was stopped\n");

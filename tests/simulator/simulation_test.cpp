@@ -115,6 +115,17 @@ TEST(Interruption, EndsTheToolAndTheSimulatorByTheSignal) {
   }
 }
 
+// As of what nohup starts.
+TEST(Interruption, IsNoneByASignalThatTheCallerIgnores) {
+  const Probe slow({"sign 3 0000", "pid", "sleep 1"});
+  const ProcessResult result = RunProcess(
+      {"bash", "-c",
+       "trap '' HUP; \"$@\" & while [ ! -s \"$0\" ]; do sleep 0.02; done; kill -HUP $!; wait $!",
+       slow.path() + ".pid", SimulatorPath(), "--quiet", "--tool", PROBE_PATH, slow.path()});
+  EXPECT_EQ(result.output, "TRUSTED JAR  " + slow.path() + "\n");
+  EXPECT_EQ(result.status, 0);
+}
+
 // Names may come from whoever made the files.
 TEST(Files, NamesReachNoTerminalAsTheyAre) {
   const TempDir folder;
@@ -326,13 +337,14 @@ TEST(State, LastsForTheFilesOfOneRunWithoutADirectory) {
   EXPECT_EQ(verified[1]["result"], 0);
 }
 
+// The last runs begin when the first have ended.
 TEST(State, IsNotSharedWhenSeveralFilesRunAtATime) {
   const Probe jar({"verify 3", "sign 3 0000"});
-  const ProcessResult result = Simulated({"--jobs", "2", "--json", jar.path(), jar.path()});
+  const ProcessResult result = Simulated(
+      {"--jobs", "2", "--json", jar.path(), jar.path(), jar.path(), jar.path(), jar.path()});
   const std::vector<Json> verified = OfKind(ParseJournal(result.output), "verify");
-  ASSERT_EQ(verified.size(), 2U);
-  EXPECT_EQ(verified[0]["result"], -1);
-  EXPECT_EQ(verified[1]["result"], -1);
+  ASSERT_EQ(verified.size(), 5U);
+  for (const Json& event : verified) EXPECT_EQ(event["result"], -1);
 }
 
 TEST(Tool, RunsAsItIsOnAFileThatIsNoZip) {

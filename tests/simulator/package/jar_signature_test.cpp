@@ -115,6 +115,12 @@ TEST(JarSignatureFacts, SignerThatNamesAnotherCertificateIsSeen) {
   options.block.serial = der::Integer(99);
   EXPECT_TRUE(SignatureOf(MakePackage(options)).names_other_certificate);
   EXPECT_FALSE(SignatureOf(MakePackage()).names_other_certificate);
+  // Without a signer that reads there is nobody to name one.
+  options.block.signer_infos = der::Set({});
+  const JarSignatureFacts unsigned_block = SignatureOf(MakePackage(options));
+  ASSERT_TRUE(unsigned_block.certificate.has_value());
+  EXPECT_FALSE(unsigned_block.block.is_whole);
+  EXPECT_FALSE(unsigned_block.names_other_certificate);
 }
 
 TEST(JarSignatureFacts, BlockIsTheOneThatTheToolLooksFor) {

@@ -108,6 +108,21 @@ TEST(SignedBytes, AreKeptByTheirDigest) {
   EXPECT_TRUE(second.Holds(file, kLater));
 }
 
+TEST(SignedBytes, ThatAreNotSharedAreForLaterRunsAlone) {
+  const TempDir folder;
+  const std::string file = folder.Write("file", ToBytes("abc"));
+  SignedBytes none("", false);
+  EXPECT_TRUE(none.Add(file, kLater));
+  EXPECT_FALSE(none.Holds(file, kLater));
+  SignedBytes kept(folder / "state", false);
+  ASSERT_TRUE(kept.Load());
+  EXPECT_TRUE(kept.Add(file, kLater));
+  EXPECT_FALSE(kept.Holds(file, kLater));
+  SignedBytes later(folder / "state", false);
+  ASSERT_TRUE(later.Load());
+  EXPECT_TRUE(later.Holds(file, kLater));
+}
+
 TEST(SignedBytes, OfAFileThatCannotBeReadAreNeverTrusted) {
   const TempDir folder;
   SignedBytes bytes(folder / "state", true);

@@ -145,6 +145,8 @@ TEST(MakeReport, LibraryWithOtherBytesIsRefused) {
   EXPECT_EQ(report.verdict, Verdict::kPartlySigned);
   EXPECT_EQ(ItemsOf(report),
             Lines({"package done", "lib/arm64/libfoo.so refused library-changed"}));
+  EXPECT_TRUE(report.items[0].is_verified);
+  EXPECT_FALSE(report.items[1].is_verified);
 }
 
 // The library's item where this is logged of it, and opening it ends like this.
@@ -273,6 +275,7 @@ TEST(MakeReport, LibrariesOfARefusedPackageFollowIt) {
                              facts);
   EXPECT_EQ(report.verdict, Verdict::kRefused);
   EXPECT_EQ(ItemsOf(report)[1], "lib/arm64/libfoo.so refused package-refused");
+  EXPECT_FALSE(report.items[0].is_verified);
 }
 
 // The tool names no path when it may not sign; the order of the libraries tells which it was.
@@ -289,6 +292,16 @@ TEST(MakeReport, LibrariesThatTheKernelWasNotAskedForAreKnownByTheirOrder) {
                                     "lib/arm64/libb.so refused integrity-zero"}));
 }
 
+TEST(MakeReport, LibrariesBehindTheToolsEndAreNotReached) {
+  const Report report = Made({kLibrariesStart, kTakesUp, Integrity("1f"),
+                              Sign("/data/app/lib/arm64/liba.so", kPackagePayload)},
+                             WithLibraries({"lib/arm64-v8a/liba.so", "lib/arm64-v8a/libb.so"}), {},
+                             {{"event", "exit"}, {"signal", 9}});
+  EXPECT_EQ(ItemsOf(report),
+            Lines({"package refused not-reached", "lib/arm64/liba.so done",
+                   "lib/arm64/libb.so refused not-reached", "tool refused tool-killed 9"}));
+}
+
 TEST(MakeReport, IntegrityValuesAreReadAsTheToolReadsThem) {
   const auto reason = [](const Json& value) {
     return Items({kFileStart, kTakesUp, Integrity(value), CannotSign(2)})[0];
@@ -298,6 +311,30 @@ TEST(MakeReport, IntegrityValuesAreReadAsTheToolReadsThem) {
   EXPECT_EQ(reason("none"), "package refused integrity-unreadable none");
   EXPECT_EQ(reason(""), "package refused integrity-unreadable");
   EXPECT_EQ(reason(nullptr), "package refused integrity-missing");
+}
+
+// Payload and key are those that the kernel got, with the package or else with a library. The
+// tool's own code is asked where it got none.
+TEST(MakeReport, KeyIsTheOneThatTheKernelGot) {
+  const std::string own(64, 'a'), other(64, 'b');
+  PackageFacts facts = WithLibraries({"lib/arm64-v8a/libfoo.so"});
+  facts.jar.key = ToolKey{own, 256, 2048, 65537, false};
+  const auto told = [&facts](const Events& events) {
+    const Report report = Made(events, facts);
+    return report.key->sha256.substr(0, 1) + " " + std::to_string(report.key->bits) +
+           (report.key->was_got ? " got " : " not got ") + report.payload.substr(0, 5);
+  };
+  const Events library = {kLibrariesStart, kTakesUp, Sign(kLibrary, "2000" + other)};
+  EXPECT_EQ(told({kFileStart, kTakesUp, Sign(kFile, "2000" + own)}), "a 2048 got 2000a");
+  EXPECT_EQ(told({kFileStart, kTakesUp, Sign(kFile, "2000" + other)}), "b 0 got 2000b");
+  EXPECT_EQ(told({kFileStart, kTakesUp, Sign(kFile, "2000" + other, EPERM)}), "a 2048 not got ");
+  EXPECT_EQ(
+      told({library[0], library[1], library[2], kFileStart, kTakesUp, Sign(kFile, "2000" + own)}),
+      "a 2048 got 2000a");
+  EXPECT_EQ(told({library[0], library[1], library[2], kFileStart, kTakesUp,
+                  Sign(kFile, "2000" + own, EPERM)}),
+            "b 0 got 2000b");
+  EXPECT_EQ(told({Log(6, "Can't validate manifest.\n")}), "a 2048 not got ");
 }
 
 // Of one file as well, and of a library whose path nobody told.
