@@ -39,7 +39,7 @@ _apktoolkit_sim() {
       if [[ $word == -* ]]; then
         mapfile -t COMPREPLY < <(
           compgen -W "--help --html --install --integrity --jobs --journal --json --quiet
-            --runner --sign-errno --state --strict --timeout --tool --trust --verbose
+            --runner --sign-errno --state --strict --timeout --tool --trust --verbose --verify
             --verify-errno --version --zu-result" -- "$word"
         )
       else

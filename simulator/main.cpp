@@ -28,7 +28,12 @@ int main(int argc, char** argv) {
       files.size(), options.run.jobs, [&](size_t i) { runs[i] = simulator.Run(files[i]); },
       [&](size_t i) {
         const FileRun run = *std::exchange(runs[i], std::nullopt);
-        presenter.Show(MakeReport(run.record, run.facts, options.judge), run.journal);
+        const Report report = MakeReport(run.record, run.facts, options.judge);
+        if (options.verify) {
+          presenter.ShowAnswer(run.record, report, run.journal);
+        } else {
+          presenter.Show(report, run.journal);
+        }
       },
       [&](size_t i, int seconds) { presenter.ShowProgress(files[i], seconds); });
   const int status = presenter.Finish();

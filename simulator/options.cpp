@@ -41,6 +41,7 @@ void AddKernelAnswer(CLI::App* app, const char* name, int* error, const char* de
 void AddInstallation(CLI::App* app, Options* options);
 void AddOutput(CLI::App* app, Options* options);
 void AddRun(CLI::App* app, Options* options, std::string* runner);
+void AddVerify(CLI::App* app, Options* options);
 int ErrorNumber(const std::string& name);
 std::optional<int> NameUnknownOption(const CLI::App& app);
 
@@ -51,7 +52,6 @@ std::optional<int> ParseOptions(int argc, char** argv, Options* options) {
   app.footer(kFooter);
   app.get_formatter()->column_width(28);
   app.allow_extras();  // so that they can be named
-  options->run.tool = ProgramDirectory() + "/apktoolkit";
   std::string runner;
 
   app.add_option("FILE", options->files, "Packages, JARs or other files")
@@ -63,6 +63,7 @@ std::optional<int> ParseOptions(int argc, char** argv, Options* options) {
   AddInstallation(&app, options);
   AddOutput(&app, options);
   AddRun(&app, options, &runner);
+  AddVerify(&app, options);
   app.set_help_flag("-h,--help", "Print this help");
   app.set_version_flag("--version", "apktoolkit-sim " APKTOOLKIT_VERSION, "Print the version");
   try {
@@ -76,6 +77,10 @@ std::optional<int> ParseOptions(int argc, char** argv, Options* options) {
   }
   for (const std::string& word : Split(runner, ' ')) {
     if (!word.empty()) options->run.runner.push_back(word);
+  }
+  if (app.count("--tool") == 0) {
+    options->run.tool =
+        ProgramDirectory() + (options->verify ? "/apktoolkit-verify" : "/apktoolkit");
   }
   return NameUnknownOption(app);
 }
@@ -193,6 +198,17 @@ void AddRun(CLI::App* app, Options* options, std::string* runner) {
                   "takes -E NAME=VALUE [default: none]")
       ->type_name("COMMAND")
       ->take_last();
+}
+
+// Nothing is signed then, and so there is no verdict that could be told.
+void AddVerify(CLI::App* app, Options* options) {
+  CLI::Option* const verify = app->add_flag("--verify", options->verify,
+                                            "Sign nothing: ask the kernel which FILEs it\n"
+                                            "trusts, by the apktoolkit-verify beside this\n"
+                                            "program");
+  for (const char* name : {kInstall, "--strict", "--quiet", "--verbose", "--html"}) {
+    verify->excludes(app->get_option(name));
+  }
 }
 
 // What begins with "-" and is no option may have been meant for a file.

@@ -15,6 +15,7 @@ struct Options {
   RunOptions run;
   JudgeOptions judge;
   ShowOptions show;
+  bool verify = false;             // ask the kernel which files it trusts, and nothing else
   std::vector<std::string> files;  // what the tool is run for; at least one
 };
 

@@ -33,3 +33,4 @@ bool AreProgramsEmulated();
 // The built programs.
 std::string ToolPath();
 std::string SimulatorPath();
+std::string VerifyPath();

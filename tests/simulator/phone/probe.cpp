@@ -58,11 +58,11 @@ std::string FromHex(const std::string& digits) {
 // Kept for the life of the process.
 const void* Memory(const std::string& word) {
   if (word == "null") return nullptr;
-  constexpr size_t kPage = 4096;
+  const auto page = static_cast<size_t>(sysconf(_SC_PAGESIZE));
   void* const pages =
-      mmap(nullptr, 2 * kPage, PROT_READ | PROT_WRITE, MAP_PRIVATE | MAP_ANONYMOUS, -1, 0);
-  char* const second = static_cast<char*>(pages) + kPage;
-  munmap(second, kPage);
+      mmap(nullptr, 2 * page, PROT_READ | PROT_WRITE, MAP_PRIVATE | MAP_ANONYMOUS, -1, 0);
+  char* const second = static_cast<char*>(pages) + page;
+  munmap(second, page);
   if (word == "wild") return second;
   // "cut": one of two bytes of data is there.
   if (word == "cut") return memcpy(second - 3, "\2\0a", 3);
