@@ -68,6 +68,9 @@ TEST(ExitStatus, ThreeWhenTheToolDoesNotEnd) {
   EXPECT_EQ(run.errors, "apktoolkit-sim: " + probe.path() +
                             ": it was still busy after 3 seconds and was stopped\n");
   EXPECT_EQ(run.events.back(), Json({{"event", "exit"}, {"signal", 9}}));
+  EXPECT_EQ(
+      probe.Run({"--timeout", "1"}).errors,
+      "apktoolkit-sim: " + probe.path() + ": it was still busy after 1 second and was stopped\n");
 }
 
 // Whoever reads a pipe waits for a writer, and a device has no end: neither is read to remember it.

@@ -115,7 +115,10 @@ TEST(JarSignatureFacts, SignerThatNamesAnotherCertificateIsSeen) {
   options.block.serial = der::Integer(99);
   EXPECT_TRUE(SignatureOf(MakePackage(options)).names_other_certificate);
   EXPECT_FALSE(SignatureOf(MakePackage()).names_other_certificate);
-  // Without a signer that reads there is nobody to name one.
+  // Without a signer that reads there is nobody to name one. The certificate has a key identifier.
+  Certificate certificate;
+  certificate.extensions = {Extension("2.5.29.14", der::OctetString({1, 2, 3}))};
+  options.block.certificates = certificate.Build();
   options.block.signer_infos = der::Set({});
   const JarSignatureFacts unsigned_block = SignatureOf(MakePackage(options));
   ASSERT_TRUE(unsigned_block.certificate.has_value());

@@ -32,6 +32,8 @@ TEST(SignedBytes, AreTrustedUnderAnyNameWhileTheyStayTheSame) {
   EXPECT_TRUE(bytes.Holds(copy, kLater));
   folder.Write("file", ToBytes("abd"));
   EXPECT_FALSE(bytes.Holds(file, kLater));
+  folder.Write("file", ToBytes("abcd"));
+  EXPECT_FALSE(bytes.Holds(file, kLater));
 }
 
 TEST(SignedBytes, OfTheSameFileAreTrustedUnlessItWasTouched) {

@@ -249,11 +249,33 @@ TEST(MakeReport, DamagedEntriesAreADoubtAndForTheStrictARefusal) {
             Lines({"package done", "entries refused entries-damaged 2 entries: res/a, ..."}));
 }
 
+TEST(MakeReport, OtherWarningsAreNoRefusalForTheStrict) {
+  PackageFacts facts;
+  facts.was_changed = true;
+  const Report report = Made({kFileStart, Sign(kFile, kPackagePayload)}, facts, {true});
+  EXPECT_EQ(ItemsOf(report), Lines({"package done"}));
+  ASSERT_EQ(report.warnings.size(), 1U);
+  EXPECT_EQ(report.warnings[0].cause, &cause::kFileChanged);
+}
+
 TEST(MakeReport, LibraryThatVanishedIsRefused) {
   EXPECT_EQ(Items({kLibrariesStart, Log(6, "File " + kLibrary + " is not opened"),
                    Log(6, "Error 2: No such file or directory.\n"), kFileStart,
                    Sign(kFile, kPackagePayload)})[1],
             "lib/arm64/libfoo.so refused library-not-opened ENOENT: No such file or directory");
+}
+
+TEST(MakeReport, EachVanishedLibraryHasItsOwnError) {
+  const Lines items = Items({kLibrariesStart, Log(6, "File /data/app/a.so is not opened"),
+                             Log(6, "Error 2: x.\n"), Log(6, "File /data/app/b.so is not opened"),
+                             Log(6, "Error 13: x.\n"), kFileStart, Sign(kFile, kPackagePayload)});
+  EXPECT_EQ(items[1], "a.so refused library-not-opened ENOENT: No such file or directory");
+  EXPECT_EQ(items[2], "b.so refused library-not-opened EACCES: Permission denied");
+}
+
+TEST(MakeReport, ErrorThatNoLineTellsTheUseOfCounts) {
+  EXPECT_EQ(Items({kFileStart, Sign(kFile, kPackagePayload), Log(6, "Can't open file: x\n")}),
+            Lines({"package done", "tool refused tool-error Can't open file: x"}));
 }
 
 TEST(MakeReport, LibrariesOfOtherProcessorsAreNothingToSign) {
