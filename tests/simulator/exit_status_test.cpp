@@ -157,6 +157,14 @@ TEST(ExitStatus, ThreeWhenTheJournalCannotBeWritten) {
             "or directory\n");
 }
 
+TEST(ExitStatus, ThreeWhenTheJournalIsFull) {
+  const Probe probe({"sign 3 0100ab"});
+  const ProcessResult result = Simulated({"--journal", "/dev/full", probe.path()});
+  EXPECT_EQ(result.status, 3);
+  EXPECT_EQ(LinesOf(result.errors)[0],
+            "apktoolkit-sim: cannot write the journal /dev/full: No space left on device");
+}
+
 TEST(ExitStatus, ThreeWhenThePageCannotBeWritten) {
   const Probe probe({"sign 3 0100ab"});
   const ProcessResult nowhere = Simulated({"--html", "/nowhere/page", probe.path()});
