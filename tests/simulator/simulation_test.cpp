@@ -73,6 +73,21 @@ TEST(Files, ShowProgressOnATerminalWhenItTakesLonger) {
   EXPECT_NE(verdict, std::string::npos) << result.output;
 }
 
+// https://no-color.org
+TEST(Files, HaveNoColoursWhereTheUserWantsNone) {
+  if (RunProcess({"script", "-qec", "true", "/dev/null"}).status != 0) {
+    GTEST_SKIP() << "there are no pseudo-terminals here: /dev/pts is not mounted";
+  }
+  const Probe good({"sign 3 0000"});
+  const auto shown = [&good](const std::string& assignment) {
+    const std::string command = "env " + assignment + " LC_ALL=C.UTF-8 " + SimulatorPath() +
+                                " --quiet --tool " + PROBE_PATH + " " + good.path();
+    return RunProcess({"script", "-qec", command, "/dev/null"}).output;
+  };
+  EXPECT_EQ(shown("NO_COLOR=1"), "TRUSTED JAR  " + good.path() + "\r\n");
+  EXPECT_EQ(shown("-u NO_COLOR"), "\x1b[32mTRUSTED JAR\x1b[0m  " + good.path() + "\r\n");
+}
+
 // Runs a command, sends it `signal` as soon as a file that `pattern` names has something in it, and
 // gives the signal by which it ended (0 if by none) and the seconds that this took.
 struct Interrupted {
