@@ -161,8 +161,9 @@ TEST(ExitStatus, ThreeWhenTheJournalIsFull) {
   const Probe probe({"sign 3 0100ab"});
   const ProcessResult result = Simulated({"--journal", "/dev/full", probe.path()});
   EXPECT_EQ(result.status, 3);
-  EXPECT_EQ(LinesOf(result.errors)[0],
-            "apktoolkit-sim: cannot write the journal /dev/full: No space left on device");
+  const std::string message =
+      "apktoolkit-sim: cannot write the journal /dev/full: No space left on device\n";
+  EXPECT_EQ(result.errors.rfind(message, 0), 0U) << result.errors;
 }
 
 TEST(ExitStatus, ThreeWhenThePageCannotBeWritten) {
