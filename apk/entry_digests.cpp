@@ -1,7 +1,6 @@
 #include "apk/entry_digests.h"
 
 #include <algorithm>
-#include <functional>
 #include <utility>
 
 namespace ApkTools {
@@ -13,7 +12,13 @@ ManifestMf::Section::value_type DigestOf(const ManifestMf::Section& section) {
   return section.findLastEndingIn("-Digest");
 }
 
-size_t Hash(std::string_view name) { return std::hash<std::string_view>()(name); }
+// Not std::hash: in the C++ libraries of older releases it wraps without being marked, and a
+// product may build with a trap for that.
+size_t Hash(std::string_view name) {
+  size_t hash = 0;
+  for (const char c : name) hash = (hash << 9 | hash >> 55) ^ static_cast<uint8_t>(c);
+  return hash;
+}
 
 }  // namespace
 

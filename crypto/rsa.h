@@ -27,7 +27,7 @@ using rsa_local = mpi_owner<rsa_context>;
 inline constexpr uint32_t kRsaMinModulusSize = 16;
 inline constexpr uint32_t kRsaMaxModulusSize = 512;
 
-// True if anyone can make the signatures of a key with this exponent. The caller refuses such a key.
+// True if anyone can make the signatures of a key with this exponent. The caller refuses such keys.
 // Deliberate: of all exponents this one is judged, the sign being of no account (mpi_pow_mod). A
 // number to the power of 1 is itself, so that everyone could write down signatures for any key
 // (docs/decisions/exponent-of-one.md).

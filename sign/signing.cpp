@@ -116,11 +116,10 @@ bool SignLibrary(ApkTools::Apk& apk, const std::string& entry_name, const std::s
   // The digested file stays open, so that no other file can get its inode number meanwhile. Its
   // descriptor is a high one: the file that is signed gets the lowest that is free.
   constexpr int kFarDescriptor = 100;
-  const ScopedFd digested(fcntl(ScopedFd(OpenForReading(target.c_str(), O_CLOEXEC)).get(),
-                                F_DUPFD_CLOEXEC, kFarDescriptor));
+  const ScopedFd kept(fcntl(ScopedFd(OpenForReading(target.c_str(), O_CLOEXEC)).get(),
+                            F_DUPFD_CLOEXEC, kFarDescriptor));
   struct stat read = {};
-  if (!apk.VerifyFileHash(entry_name, target, &read, digested.get())) return false;
-  if (digested.get() < 0) return false;
+  if (!apk.VerifyFileHash(entry_name, target, &read, kept.get()) || kept.get() < 0) return false;
 
   const ScopedFd library(OpenForReading(target.c_str(), 0));
   if (library.get() < 0) {

@@ -44,8 +44,9 @@ _apktoolkit_sim() {
     *)
       if [[ $word == -* ]]; then
         mapfile -t COMPREPLY < <(
-          compgen -W "--api --help --html --install --installer --integrity --jobs --journal --json --quiet
-            --runner --sign-errno --state --strict --timeout --tool --trust --verbose
+          compgen -W "--api --help --html --install --installer --integrity --jobs --journal
+            --json --quiet --runner --sign-errno --state --strict --timeout --tool --trust
+            --verbose --verify
             --verify-errno --version --zu-result" -- "$word"
         )
       else

@@ -42,7 +42,12 @@ int main(int argc, char** argv) {
       [&](size_t i) {
         const FileRun run = *std::exchange(runs[i], std::nullopt);
         const Judgement judgement = std::exchange(judgements[i], {});
-        presenter.Show(MakeReport(run.record, run.facts, options.judge, judgement), run.journal);
+        const Report report = MakeReport(run.record, run.facts, options.judge, judgement);
+        if (options.verify) {
+          presenter.ShowAnswer(run.record, report, run.journal);
+        } else {
+          presenter.Show(report, run.journal);
+        }
       },
       [&](size_t i, int seconds) { presenter.ShowProgress(files[i], seconds); });
   const int status = presenter.Finish();

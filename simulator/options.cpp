@@ -42,13 +42,14 @@ constexpr struct {
              {"arm64", InstalledAbi::kArm64},
              {"arm", InstalledAbi::kArm}};
 
-std::vector<std::string> WordsOf(int argc, char** argv);
+std::vector<std::string> CommandLineOf(int argc, char** argv);
 void AddPhone(CLI::App* app, Options* options);
 void AddKernelAnswer(CLI::App* app, const char* name, int* error, const char* description);
 void AddInstallation(CLI::App* app, Options* options);
 void AddInstaller(CLI::App* app, Options* options);
 void AddOutput(CLI::App* app, Options* options);
 void AddRun(CLI::App* app, Options* options, std::string* runner);
+void AddVerify(CLI::App* app, Options* options);
 bool ReadLevels(const std::string& text, LevelRange* levels);
 int ErrorNumber(const std::string& name);
 std::optional<int> NameUnknownOption(const CLI::App& app);
@@ -60,7 +61,6 @@ std::optional<int> ParseOptions(int argc, char** argv, Options* options) {
   app.footer(kFooter);
   app.get_formatter()->column_width(28);
   app.allow_extras();  // so that they can be named
-  options->run.tool = ProgramDirectory() + "/apktoolkit";
   options->installer.program = ProgramDirectory() + "/../lib/apktoolkit/installer.jar";
   std::string runner;
 
@@ -74,10 +74,11 @@ std::optional<int> ParseOptions(int argc, char** argv, Options* options) {
   AddInstaller(&app, options);
   AddOutput(&app, options);
   AddRun(&app, options, &runner);
+  AddVerify(&app, options);
   app.set_help_flag("-h,--help", "Print this help");
   app.set_version_flag("--version", "apktoolkit-sim " APKTOOLKIT_VERSION, "Print the version");
   try {
-    app.parse(WordsOf(argc, argv));
+    app.parse(CommandLineOf(argc, argv));
   } catch (const CLI::RequiredError& error) {
     if (const auto status = NameUnknownOption(app)) return status;
     app.exit(error);
@@ -86,8 +87,13 @@ std::optional<int> ParseOptions(int argc, char** argv, Options* options) {
     return app.exit(error) == 0 ? 0 : kUsageError;
   }
   options->installer.timeout = options->run.timeout;
+  if (options->verify) options->installer.use = InstallerUse::kOff;
   for (const std::string& word : Split(runner, ' ')) {
     if (!word.empty()) options->run.runner.push_back(word);
+  }
+  if (app.count("--tool") == 0) {
+    options->run.tool =
+        ProgramDirectory() + (options->verify ? "/apktoolkit-verify" : "/apktoolkit");
   }
   return NameUnknownOption(app);
 }
@@ -96,7 +102,7 @@ namespace {
 
 // The command line as CLI11 takes it, from the back, with the value that an --install without one
 // stands for: the word after it is a file.
-std::vector<std::string> WordsOf(int argc, char** argv) {
+std::vector<std::string> CommandLineOf(int argc, char** argv) {
   std::vector<std::string> words(argv + std::min(argc, 1), argv + argc);
   const auto end_of_options = std::find(words.begin(), words.end(), "--");
   std::replace(words.begin(), end_of_options, std::string(kInstall),
@@ -237,6 +243,17 @@ void AddRun(CLI::App* app, Options* options, std::string* runner) {
                   "takes -E NAME=VALUE [default: none]")
       ->type_name("COMMAND")
       ->take_last();
+}
+
+// Nothing is signed then, and so there is no verdict that could be told.
+void AddVerify(CLI::App* app, Options* options) {
+  CLI::Option* const verify = app->add_flag("--verify", options->verify,
+                                            "Sign nothing: ask the kernel which FILEs it\n"
+                                            "trusts, by the apktoolkit-verify beside this\n"
+                                            "program");
+  for (const char* name : {kInstall, "--strict", "--quiet", "--verbose", "--html"}) {
+    verify->excludes(app->get_option(name));
+  }
 }
 
 // What begins with "-" and is no option may have been meant for a file.

@@ -17,6 +17,7 @@ struct Options {
   InstallerOptions installer;
   JudgeOptions judge;
   ShowOptions show;
+  bool verify = false;             // ask the kernel which files it trusts, and nothing else
   std::vector<std::string> files;  // what the tool is run for; at least one
 };
 

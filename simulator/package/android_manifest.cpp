@@ -6,6 +6,7 @@
 #include <string_view>
 
 #include "apk/apk.h"
+#include "simulator/package/resource_library.h"
 
 namespace simulator {
 
@@ -42,8 +43,7 @@ namespace {
 bool HasOverlaps(const android::ResStringPool& strings, size_t document_size) {
   uint64_t length = 0;
   for (size_t i = 0; strings.isUTF8() && i < strings.size(); ++i) {
-    size_t each = 0;
-    if (strings.string8At(i, &each) != nullptr) length += each;
+    length += StringLength(strings, i);
   }
   return length > document_size;
 }

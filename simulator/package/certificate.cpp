@@ -23,7 +23,7 @@ std::string IssuerAndSerial(const X509* certificate);
 std::string Text(const uint8_t* bytes, int size);
 std::string NameText(const X509_NAME* name);
 std::string AttributeText(const X509_NAME_ENTRY* attribute);
-std::string KeyName(const ASN1_OBJECT* algorithm);
+std::string KeyKind(const ASN1_OBJECT* algorithm);
 std::string SignatureName(const ASN1_OBJECT* algorithm);
 
 }  // namespace
@@ -88,7 +88,7 @@ PublicKey ReadKey(X509* certificate) {
   X509_PUBKEY* const info = X509_get_X509_PUBKEY(certificate);
   ASN1_OBJECT* algorithm = nullptr;
   X509_PUBKEY_get0_param(&algorithm, nullptr, nullptr, nullptr, info);
-  key.algorithm = KeyName(algorithm);
+  key.algorithm = KeyKind(algorithm);
   uint8_t* der = nullptr;
   const int size = i2d_X509_PUBKEY(info, &der);
   const bssl::UniquePtr<uint8_t> owner(der);
@@ -145,7 +145,7 @@ std::string AttributeText(const X509_NAME_ENTRY* attribute) {
 }
 
 // The JDK's names of the three kinds that sign packages.
-std::string KeyName(const ASN1_OBJECT* algorithm) {
+std::string KeyKind(const ASN1_OBJECT* algorithm) {
   const AlgorithmFacts facts = AlgorithmOf(algorithm);
   if (facts.nid == NID_rsaEncryption) return "RSA";
   if (facts.nid == NID_X9_62_id_ecPublicKey) return "EC";

@@ -14,6 +14,8 @@
 struct __android_logger_data;
 struct __android_log_message;
 
+namespace simulator {
+
 template <typename Record, typename = void>
 inline constexpr bool kLogLibraryHas = false;
 template <typename Record>
@@ -29,3 +31,5 @@ template <typename Message, typename Write>
 void ReadLogRecord(const Message* message, Write write) {
   if constexpr (kLogLibraryHas<Message>) write(message->priority, message->tag, message->message);
 }
+
+}  // namespace simulator

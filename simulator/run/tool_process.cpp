@@ -17,7 +17,7 @@ namespace {
 
 using Words = std::vector<std::string>;
 
-Words WordsOf(const ToolCommand& command, Words* environment);
+Words CommandWords(const ToolCommand& command, Words* environment);
 Words EnvironmentWith(const Words& assignments);
 int Spawn(Words words, Words environment, pid_t* child);
 ToolEnd Wait(pid_t child, const Deadline& deadline);
@@ -27,7 +27,7 @@ std::vector<char*> Pointers(Words* words);
 
 ToolEnd RunTool(const ToolCommand& command, const Deadline& deadline) {
   Words environment = command.environment;
-  const Words words = WordsOf(command, &environment);
+  const Words words = CommandWords(command, &environment);
   pid_t child = 0;
   const int error = Spawn(words, EnvironmentWith(environment), &child);
   if (error != 0) return {ToolEnd::How::kNotStarted, error};
@@ -49,7 +49,7 @@ namespace {
 
 // The stand-in is loaded into the tool alone: a runner hands the variable on, and has not got it
 // itself.
-Words WordsOf(const ToolCommand& command, Words* environment) {
+Words CommandWords(const ToolCommand& command, Words* environment) {
   const std::string preload = "LD_PRELOAD=" + command.kernel;
   Words words = command.runner;
   if (words.empty()) {

@@ -129,11 +129,11 @@ void AddItems(const Report& report, data* file) {
   if (items.size() > kMostPageLines) {
     std::stable_partition(items.begin(), items.end(), is_refused);
   }
-  const Item* const last = items.data() + std::min(items.size(), kMostPageLines) - 1;
+  const Item* const end = items.data() + std::min(items.size(), kMostPageLines);
   const auto make = [&](const Item& item) {
     const Mark mark = MarkOf(item.state);
     const Item shown = Short(item);
-    const bool has_cure = HasCure(item, &item == last ? nullptr : &item + 1);
+    const bool has_cure = HasCure(item, &item + 1 == end ? nullptr : &item + 1);
     return object{{"mark", Shown(SymbolOf(mark, true))},
                   {"state", Shown(StateOf(mark))},
                   {"name", Shown(NameOf(shown))},

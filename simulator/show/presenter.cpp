@@ -45,6 +45,7 @@ bool Presenter::Begin() {
 
 void Presenter::Show(const Report& report, const std::string& journal) {
   EraseProgress();
+  ++shown_;
   Keep(journal + VerdictEvent(report));
   if (!options_.json) {
     const bool has_gap = !verdicts_.empty() && options_.detail != Detail::kVerdict;
@@ -61,11 +62,28 @@ void Presenter::Show(const Report& report, const std::string& journal) {
   status_ = std::max<int>(status_, StatusOf(report.verdict));
 }
 
+void Presenter::ShowAnswer(const RunRecord& run, const Report& report, const std::string& journal) {
+  EraseProgress();
+  ++shown_;
+  Keep(journal);
+  for (const auto& event : run.events) {
+    const bool is_output = TextOf(event, "event") == "stdout";
+    if (is_output && !options_.json) std::cout << TextOf(event, "text");
+  }
+  std::cout.flush();
+  std::string problem;
+  if (run.signal) problem = "it was killed by signal " + std::to_string(*run.signal);
+  if (run.failure.kind != Failure::Kind::kNone) problem = report.items[0].reason.Text();
+  if (!problem.empty()) Complain(kCannotSimulate, run.file + ": " + problem);
+  const int status = static_cast<int>(run.status);
+  status_ = std::max(status_, problem.empty() ? status : kCannotSimulate);
+}
+
 // Erased again before anything else is written.
 void Presenter::ShowProgress(const std::string& file, int seconds) {
   if (!has_progress_) return;
-  std::cerr << kEraseLine << verdicts_.size() << " of " << file_count_ << " done; "
-            << Printable(file, look_) << ": " << seconds << " s" << std::flush;
+  std::cerr << kEraseLine << shown_ << " of " << file_count_ << " done; " << Printable(file, look_)
+            << ": " << seconds << " s" << std::flush;
   is_progress_shown_ = true;
 }
 
@@ -76,7 +94,8 @@ void Presenter::EraseProgress() {
 
 int Presenter::Finish() {
   EraseProgress();
-  if (!options_.json && options_.detail != Detail::kVerdict && file_count_ > 1) {
+  if (!options_.json && options_.detail != Detail::kVerdict && file_count_ > 1 &&
+      !verdicts_.empty()) {
     std::cout << '\n' << Summary(verdicts_) << '\n';
   }
   if (page_file_.IsWanted() && !page_file_.Append(page_.Html())) FailToWrite(page_file_);

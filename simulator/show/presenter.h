@@ -6,6 +6,7 @@
 #include <string>
 #include <vector>
 
+#include "simulator/run/run_record.h"
 #include "simulator/show/output_file.h"
 #include "simulator/show/page.h"
 #include "simulator/show/report_text.h"
@@ -30,6 +31,8 @@ class Presenter {
   bool Begin();
   // `journal` are the lines of the run, from "start" to "exit".
   void Show(const Report& report, const std::string& journal);
+  // Of a run of apktoolkit-verify: what it printed. `report` says why it could not be simulated.
+  void ShowAnswer(const RunRecord& run, const Report& report, const std::string& journal);
   void ShowProgress(const std::string& file, int seconds);
   // Tells what belongs to the end. The highest status of all; kCannotSimulate at least when
   // something could not be written.
@@ -48,6 +51,7 @@ class Presenter {
   OutputFile page_file_;
   Page page_;
   std::vector<Verdict> verdicts_;
+  size_t shown_ = 0;  // files, by a verdict or an answer
   bool is_progress_shown_ = false;
   std::string missing_;  // why the installer was not asked; empty: it was, or nobody wanted it
   int status_ = kAllSigned;

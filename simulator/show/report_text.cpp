@@ -156,7 +156,9 @@ void Printer::PrintCure(const Cause& cause) {
 }
 
 void Printer::PrintRows(const Rows& rows) {
-  for (const auto& [label, value] : rows) Print("    " + label + ": " + value);
+  for (const auto& [label, value] : rows) {
+    Print(std::string("    ").append(label).append(": ").append(value));
+  }
 }
 
 std::string ShareText(const Share& share, const char* what) {

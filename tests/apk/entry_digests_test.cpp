@@ -85,6 +85,47 @@ TEST(EntryDigests, OfManyEqualNamesTheLastSectionCounts) {
   EXPECT_EQ("SHA-256-Digest 0", recorded.Of("z"));
 }
 
+// The hash of a name turns by 9 bits before each letter. After 64 letters it is where it was, and
+// so names that have the same letters there share a hash, in whatever order these are.
+std::string With64Between(const std::string& letters) {
+  std::string name;
+  for (const char letter : letters) name += letter + std::string(63, '/');
+  return name;
+}
+
+// Which of the names share one: all, some, those next to one another. A byte that seven others
+// follow was rotated by 63 bits to the left, so an even one by one to the right. "b" and "q" make
+// 0x31 ^ 0x71, "d" and "r" 0x32 ^ 0x72, both 0x40.
+TEST(EntryDigests, NamesThatShareAHashAreToldApart) {
+  const std::vector<std::string> families[] = {
+      {With64Between("abc"), With64Between("acb"), With64Between("bac"), With64Between("bca"),
+       With64Between("cab")},
+      {With64Between("abc"), "abc", With64Between("bac"), "bac", With64Between("cba")},
+      {"b123456q", "d123456r", "e", With64Between("xy"), With64Between("yx")}};
+  const std::string order = "bdacbaecdab";
+  for (const std::vector<std::string>& names : families) {
+    std::string sections;
+    const auto name_of = [&](char letter) { return names[static_cast<size_t>(letter - 'a')]; };
+    for (size_t i = 0; i < order.size(); ++i)
+      sections += Section(name_of(order[i]), std::to_string(i));
+    const Recorded recorded(sections);
+    for (const char letter : std::string("abcde")) {
+      EXPECT_EQ("SHA-256-Digest " + std::to_string(order.rfind(letter)),
+                recorded.Of(name_of(letter)));
+    }
+  }
+}
+
+TEST(EntryDigests, ANameThatOnlySharesAHashHasNoDigest) {
+  const Recorded recorded(Section("d", "1") + Section("d123456r", "2") +
+                          Section(With64Between("cba"), "3") + Section(With64Between("abc"), "4"));
+  for (const std::string& name :
+       {std::string("b123456q"), With64Between("acb"), With64Between("bac"), With64Between("cab"),
+        With64Between("bca")}) {
+    EXPECT_EQ("none", recorded.Of(name)) << name;
+  }
+}
+
 TEST(EntryDigests, ALaterSectionWithoutADigestReplacesNothing) {
   EXPECT_EQ("SHA-256-Digest 1", Recorded(Section("a", "1") + "Name: a\r\nX: 2\r\n\r\n").Of("a"));
 }

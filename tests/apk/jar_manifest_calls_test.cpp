@@ -1,13 +1,13 @@
 // What the readers of a JAR's manifest ask of the C and the C++ library, where their results do not
-// tell: how often they compare, which names share a hash, how they copy. The linker sends the calls
-// of the whole program here (CMakeLists.txt names them as the compiler does).
+// tell: how often they compare, and how they copy. The linker sends the calls of the whole program
+// here.
 #include <gtest/gtest.h>
 
 #include <algorithm>
 #include <cstring>
-#include <functional>
 #include <random>
 #include <string>
+#include <utility>
 #include <vector>
 
 #include "apk/entry_digests.h"
@@ -17,20 +17,10 @@
 namespace {
 
 size_t comparisons = 0;
-// The hash of a name, where it is not the library's.
-std::function<size_t(std::string_view)> hash;
 // Copies begin at the last byte, as memcpy may, whose pieces do not overlap.
 bool copies_backwards = false;
 
 }  // namespace
-
-size_t RealHashBytes(const void*, size_t, size_t) __asm__("__real_" HASH_BYTES);
-size_t WrapHashBytes(const void*, size_t, size_t) __asm__("__wrap_" HASH_BYTES);
-
-size_t WrapHashBytes(const void* bytes, size_t size, size_t seed) {
-  if (hash) return hash(std::string_view(static_cast<const char*>(bytes), size));
-  return RealHashBytes(bytes, size, seed);
-}
 
 extern "C" {
 int __real_memcmp(const void* a, const void* b, size_t size);
@@ -56,10 +46,7 @@ namespace {
 
 class JarManifestCalls : public testing::Test {
  protected:
-  ~JarManifestCalls() override {
-    hash = nullptr;
-    copies_backwards = false;
-  }
+  ~JarManifestCalls() override { copies_backwards = false; }
 };
 
 // How often the text, of one section, has the names of its attributes compared.
@@ -127,72 +114,29 @@ TEST_F(JarManifestCalls, ATableThatWasResetSortsAsOftenAsAFreshOne) {
   EXPECT_EQ(expected, repeat(used));
 }
 
-// ---- Names that share a hash.
+// ---- Looking up a name.
 
-std::string Section(const std::string& name, int digest) {
-  return "Name: " + name + "\r\nSHA1-Digest: " + std::to_string(digest) + "\r\n\r\n";
-}
-
-class Recorded {
- public:
-  explicit Recorded(const std::string& text) {
-    EXPECT_TRUE(digests_.Load({text.begin(), text.end()}));
-    digests_.List();
-  }
-
-  // 0: none.
-  int Of(const std::string& name) const {
-    std::string digest_name, digest;
-    return digests_.Find(name, digest_name, digest) ? std::stoi(digest) : 0;
-  }
-
- private:
-  ApkTools::EntryDigests digests_;
-};
-
-constexpr char kUnordered[] = "bdacbaecdab";
-
-// Sections of these names, numbered from 1.
-std::string Sections(const std::string& names) {
+// How often the name in the middle is compared when it is looked up.
+size_t ComparisonsOfFinding(const std::vector<std::string>& names) {
   std::string text;
-  for (size_t i = 0; i < names.size(); ++i) {
-    text += Section(names.substr(i, 1), static_cast<int>(i) + 1);
-  }
-  return text;
+  for (const std::string& name : names) text += "Name: " + name + "\r\nSHA1-Digest: 1\r\n\r\n";
+  ApkTools::EntryDigests digests;
+  EXPECT_TRUE(digests.Load({text.begin(), text.end()}));
+  digests.List();
+  comparisons = 0;
+  std::string digest_name, digest;
+  EXPECT_TRUE(digests.Find("12048", digest_name, digest));
+  return comparisons;
 }
 
-// Which of the names have one: all, some, those next to one another, none.
-TEST_F(JarManifestCalls, NamesThatShareAHashAreToldApartByTheNames) {
-  const std::function<size_t(std::string_view)> hashes[] = {
-      [](std::string_view) { return size_t{7}; },
-      [](std::string_view name) { return static_cast<size_t>(name[0]) % 2; },
-      [](std::string_view name) { return static_cast<size_t>(name[0]) / 2; },
-      [](std::string_view name) { return ~static_cast<size_t>(name[0]); }};
-  for (const auto& given : hashes) {
-    hash = given;
-    const Recorded recorded(Sections(kUnordered));
-    for (const char name : std::string("abcde")) {
-      const std::string names = kUnordered;
-      EXPECT_EQ(static_cast<int>(names.rfind(name)) + 1, recorded.Of(std::string(1, name))) << name;
-    }
-    for (const char* name : {"A", "aa", "bc", "f", "z"}) EXPECT_EQ(0, recorded.Of(name)) << name;
-  }
-}
-
-// A manifest in order asks for no hash at all.
+// A comparison of two names takes some more, of the names of attributes. Names in order are
+// compared with about log2(4096) others, and those in no order with the one of the same hash.
 TEST_F(JarManifestCalls, NamesInOrderAreNotHashed) {
-  int hashed = 0;
-  hash = [&](std::string_view name) {
-    ++hashed;
-    return name.size();
-  };
-  const Recorded ordered(Sections("aabccde"));
-  EXPECT_EQ(2, ordered.Of("a"));
-  EXPECT_EQ(5, ordered.Of("c"));
-  EXPECT_EQ(0, hashed);
-  const Recorded unordered(Sections("bca"));
-  EXPECT_EQ(3, unordered.Of("a"));
-  EXPECT_EQ(4, hashed);
+  std::vector<std::string> names = ShortNames(4096);
+  const size_t in_order = ComparisonsOfFinding(names);
+  std::swap(names.front(), names.back());
+  EXPECT_GT(in_order, 3 * ComparisonsOfFinding(names));
+  EXPECT_GT(in_order, 12u);
 }
 
 // ---- Continuation lines, which move up over what lies before them.

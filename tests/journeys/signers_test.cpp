@@ -59,6 +59,15 @@ std::string Told(const std::string& name, const Lines& options = {}) {
   return RunProcess(command).output;
 }
 
+// RFC 5652 §5.3: by issuer and serial number, or by the certificate's subject key identifier.
+TEST(SignerIdentifier, MayBeTheCertificatesKeyIdentifier) {
+  for (const char* name : {"openssl-cms-keyid", "openssl-cms-sha1"}) {
+    const std::string text = Told(name);
+    EXPECT_EQ(text.rfind("SIGNED", 0), 0U) << text;
+    EXPECT_EQ(text.find("others may read another signer"), std::string::npos) << text;
+  }
+}
+
 // The line of that beginning; empty when there is none.
 std::string LineWith(const std::string& text, const std::string& part) {
   std::istringstream lines(text);

@@ -20,6 +20,7 @@ WORKSTATION_ONLY = {
     "tests/crypto/rsa_test.cpp": "compares with GMP",
     "tests/crypto/x509_authorities_test.cpp": "runs openssl",
     "tests/util/digest_test.cpp": "runs coreutils",
+    "tests/verify/error_name_test.cpp": "compares with the workstation's C library",
     "fuzz/compiled_manifest_fuzz.cpp": "replaces the program's operator new",
     "fuzz/explanation_fuzz.cpp": "reads with the simulator",
     "fuzz/integrity_fuzz.cpp": "has the linker wrap calls of the C library",
@@ -33,7 +34,7 @@ WORKSTATION_ONLY = {
 KNOWN_TYPES = {"cc_binary", "cc_defaults", "cc_library_shared", "cc_library_static", "cc_test",
                "filegroup"}
 KNOWN_PROPERTIES = {"cflags", "compile_multilib", "cpp_std", "data", "defaults",
-                    "export_include_dirs", "ldflags", "local_include_dirs", "name", "shared_libs",
+                    "export_include_dirs", "init_rc", "ldflags", "local_include_dirs", "name", "shared_libs",
                     "srcs", "static_libs"}
 
 # The first is for headers that are the system's here and the user's there. For the second, the
@@ -58,8 +59,16 @@ def hold_tool(platform, problems):
     core = cmake_sources("apktoolkit_core")
     compare("apktoolkit_core", platform.sources("apktoolkit_core"), core, problems)
     compare("apktoolkit", platform.sources("apktoolkit"), cmake_sources("apktoolkit"), problems)
+    compare("apktoolkit-verify", platform.sources("apktoolkit-verify"),
+            cmake_sources("apktoolkit-verify"), problems)
+    compare("apktoolkit-all", platform.sources("apktoolkit-all"),
+            cmake_sources("apktoolkit-all", "integration") +
+            cmake_sources("apktoolkit_caller", "integration"), problems)
+    compare("apktoolkit-bound", platform.sources("apktoolkit-bound"),
+            cmake_sources("apktoolkit-bound", "integration"), problems)
     compare("libzu", platform.sources("libzu"), cmake_sources("zu"), problems)
-    listed = core + cmake_sources("apktoolkit") + cmake_sources("zu")
+    listed = core + cmake_sources("apktoolkit") + cmake_sources("apktoolkit-verify")
+    listed += cmake_sources("zu")
     compare("the tool's folders", listed, map(str, tool_sources()), problems)
 
 

@@ -6,7 +6,7 @@ import re
 import shlex
 
 ROOT = pathlib.Path(__file__).resolve().parents[2]
-ROOMS = ("sign", "apk", "crypto", "util")
+ROOMS = ("sign", "apk", "crypto", "util", "verify")
 
 
 def tool_sources():

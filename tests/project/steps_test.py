@@ -115,6 +115,19 @@ def run_problems():
     return problems
 
 
+def emulator_problems():
+    """Without an emulator scripts/kernel is a step that was skipped."""
+    with tempfile.TemporaryDirectory() as name:
+        folder = pathlib.Path(name)
+        (folder / "scripts").mkdir()
+        shutil.copy(ROOT / "scripts/kernel", folder / "scripts")
+        write(folder / "scripts/setup", "[[ $1 != emulator ]]")
+        run = subprocess.run([folder / "scripts/kernel"], capture_output=True, text=True)
+        expected = (77, "skipped: there is no qemu, and it cannot be installed\n")
+        found = (run.returncode, run.stdout)
+        return [] if found == expected else [f"scripts/kernel without qemu ends with {found}"]
+
+
 def skip_problems():
     """scripts/bare-system says why it cannot be run here, and by its status that it was not."""
     with tempfile.TemporaryDirectory() as name:
@@ -135,4 +148,4 @@ def skip_problems():
 
 
 if __name__ == "__main__":
-    sys.exit(report(list_problems() + setup_problems() + run_problems() + list(skip_problems())))
+    sys.exit(report(list_problems() + setup_problems() + run_problems() + emulator_problems() + list(skip_problems())))

@@ -3,6 +3,8 @@
 #include <sys/stat.h>
 #include <unistd.h>
 
+#include <chrono>
+
 #include "simulator/simulated.h"
 #include "support/package.h"
 
@@ -56,13 +58,19 @@ TEST(ExitStatus, FourWhenStandardInputIsClosed) {
   EXPECT_NE(result.output.find("standard input is closed"), std::string::npos) << result.output;
 }
 
+// Not even when it is asked to.
 TEST(ExitStatus, ThreeWhenTheToolDoesNotEnd) {
-  const Probe probe({"sign 3 0100ab", "sleep 60"});
+  const Probe probe({"sign 3 0100ab", "ignore 15", "sleep 60"});
+  const auto start = std::chrono::steady_clock::now();
   const ProbeRun run = probe.Run({"--timeout", "3"});
+  EXPECT_LT(std::chrono::steady_clock::now() - start, std::chrono::seconds(30));
   EXPECT_EQ(run.status, 3);
   EXPECT_EQ(run.errors, "apktoolkit-sim: " + probe.path() +
                             ": it was still busy after 3 seconds and was stopped\n");
   EXPECT_EQ(run.events.back(), Json({{"event", "exit"}, {"signal", 9}}));
+  EXPECT_EQ(
+      probe.Run({"--timeout", "1"}).errors,
+      "apktoolkit-sim: " + probe.path() + ": it was still busy after 1 second and was stopped\n");
 }
 
 // Whoever reads a pipe waits for a writer, and a device has no end: neither is read to remember it.
@@ -148,6 +156,15 @@ TEST(ExitStatus, ThreeWhenTheJournalCannotBeWritten) {
   EXPECT_EQ(result.errors,
             "apktoolkit-sim: cannot write the journal /nowhere/journal: No such file "
             "or directory\n");
+}
+
+TEST(ExitStatus, ThreeWhenTheJournalIsFull) {
+  const Probe probe({"sign 3 0100ab"});
+  const ProcessResult result = Simulated({"--journal", "/dev/full", probe.path()});
+  EXPECT_EQ(result.status, 3);
+  const std::string message =
+      "apktoolkit-sim: cannot write the journal /dev/full: No space left on device\n";
+  EXPECT_EQ(result.errors.rfind(message, 0), 0U) << result.errors;
 }
 
 TEST(ExitStatus, ThreeWhenThePageCannotBeWritten) {

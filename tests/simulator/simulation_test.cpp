@@ -84,6 +84,21 @@ TEST(Files, ShowProgressOnATerminalWhenItTakesLonger) {
   EXPECT_NE(verdict, std::string::npos) << result.output;
 }
 
+// https://no-color.org
+TEST(Files, HaveNoColoursWhereTheUserWantsNone) {
+  if (RunProcess({"script", "-qec", "true", "/dev/null"}).status != 0) {
+    GTEST_SKIP() << "there are no pseudo-terminals here: /dev/pts is not mounted";
+  }
+  const Probe good({"sign 3 0000"});
+  const auto shown = [&good](const std::string& assignment) {
+    const std::string command = "env " + assignment + " LC_ALL=C.UTF-8 " + SimulatorPath() +
+                                " --quiet --tool " + PROBE_PATH + " " + good.path();
+    return RunProcess({"script", "-qec", command, "/dev/null"}).output;
+  };
+  EXPECT_EQ(shown("NO_COLOR=1"), "TRUSTED JAR  " + good.path() + "\r\n");
+  EXPECT_EQ(shown("-u NO_COLOR"), "\x1b[32mTRUSTED JAR\x1b[0m  " + good.path() + "\r\n");
+}
+
 // Runs a command, sends it `signal` as soon as a file that `pattern` names has something in it, and
 // gives the signal by which it ended (0 if by none) and the seconds that this took.
 struct Interrupted {
@@ -125,6 +140,17 @@ TEST(Interruption, EndsTheToolAndTheSimulatorByTheSignal) {
         "   it was interrupted\n  ✗ tool  it was interrupted\n      Run it again.\n";
     EXPECT_EQ(run.output.substr(0, start.size()), start);
   }
+}
+
+// As of what nohup starts.
+TEST(Interruption, IsNoneByASignalThatTheCallerIgnores) {
+  const Probe slow({"sign 3 0000", "pid", "sleep 1"});
+  const ProcessResult result = RunProcess(
+      {"bash", "-c",
+       "trap '' HUP; \"$@\" & while [ ! -s \"$0\" ]; do sleep 0.02; done; kill -HUP $!; wait $!",
+       slow.path() + ".pid", SimulatorPath(), "--quiet", "--tool", PROBE_PATH, slow.path()});
+  EXPECT_EQ(result.output, "TRUSTED JAR  " + slow.path() + "\n");
+  EXPECT_EQ(result.status, 0);
 }
 
 // Names may come from whoever made the files.
@@ -273,6 +299,8 @@ TEST(Simulation, SurvivesAFileThatShrinksAndGoesOnToTheNext) {
   MakePackage(options).WriteTo(folder / "whole.apk");
   MakePackage().WriteTo(folder / "good.apk");
   const std::string script =
+      // AddressSanitizer takes the signal for an error of the tool's.
+      "export ASAN_OPTIONS=\"$ASAN_OPTIONS:handle_sigbus=0\"\n"
       "cd \"$1\"; sim=$2; cp whole.apk base.apk\n"
       "(while [ ! -e end ]; do truncate -s 3000 base.apk; cp whole.apk base.apk; done) & loop=$!\n"
       "for i in $(seq 30); do \"$sim\" --installer=off --quiet base.apk good.apk >out; status=$?\n"
@@ -336,13 +364,14 @@ TEST(State, LastsForTheFilesOfOneRunWithoutADirectory) {
   EXPECT_EQ(verified[1]["result"], 0);
 }
 
+// The last runs begin when the first have ended.
 TEST(State, IsNotSharedWhenSeveralFilesRunAtATime) {
   const Probe jar({"verify 3", "sign 3 0000"});
-  const ProcessResult result = Simulated({"--jobs", "2", "--json", jar.path(), jar.path()});
+  const ProcessResult result = Simulated(
+      {"--jobs", "2", "--json", jar.path(), jar.path(), jar.path(), jar.path(), jar.path()});
   const std::vector<Json> verified = OfKind(ParseJournal(result.output), "verify");
-  ASSERT_EQ(verified.size(), 2U);
-  EXPECT_EQ(verified[0]["result"], -1);
-  EXPECT_EQ(verified[1]["result"], -1);
+  ASSERT_EQ(verified.size(), 5U);
+  for (const Json& event : verified) EXPECT_EQ(event["result"], -1);
 }
 
 TEST(Tool, RunsAsItIsOnAFileThatIsNoZip) {

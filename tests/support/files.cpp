@@ -83,7 +83,8 @@ MemoryFile::MemoryFile(const Bytes& content, const std::string& name)
 
 MemoryFile::~MemoryFile() { close(fd_); }
 
-FreeDescriptor::FreeDescriptor(int fd) : fd_(fd), kept_(dup(fd)) { close(fd); }
+// Kept far above: the lowest free number may be one that another of these makes free.
+FreeDescriptor::FreeDescriptor(int fd) : fd_(fd), kept_(dup2(fd, 100 + fd)) { close(fd); }
 
 FreeDescriptor::~FreeDescriptor() {
   dup2(kept_, fd_);

@@ -64,3 +64,5 @@ bool AreProgramsEmulated() { return *APKTOOLKIT_RUNNER != '\0'; }
 std::string ToolPath() { return APKTOOLKIT_PATH; }
 
 std::string SimulatorPath() { return APKTOOLKIT_SIM_PATH; }
+
+std::string VerifyPath() { return APKTOOLKIT_VERIFY_PATH; }

@@ -34,3 +34,4 @@ bool AreProgramsEmulated();
 // The built programs.
 std::string ToolPath();
 std::string SimulatorPath();
+std::string VerifyPath();

@@ -2,7 +2,10 @@
 
 #include <gtest/gtest.h>
 
+#include "simulator/package/facts.h"
 #include "support/compiled_manifest.h"
+#include "support/files.h"
+#include "support/package.h"
 
 using namespace simulator;
 
@@ -24,6 +27,31 @@ std::optional<bool> Extracts(const std::vector<XmlAttribute>& attributes,
       .Element("application", attributes)
       .End("manifest");
   return ParseAndroidManifest(xml.Build()).extracts_libraries;
+}
+
+// All strings of the pool are made the longest one: 40 times as long together as the document.
+Bytes WithStringsInOneAnother(Bytes bytes) {
+  constexpr size_t kPool = 8;          // behind the document's header
+  constexpr size_t kOffsets = 8 + 28;  // behind the pool's
+  // Which of the strings is the long one: its offset is followed by one that is 5000 more.
+  const auto number = [&bytes](size_t at) {
+    return bytes[at] | bytes[at + 1] << 8 | bytes[at + 2] << 16 | bytes[at + 3] << 24;
+  };
+  const int count = number(kPool + 8);
+  EXPECT_GT(count, 200);
+  int longest = 0;
+  for (int i = 0; i + 1 < count; ++i) {
+    const size_t at = kOffsets + 4 * static_cast<size_t>(i);
+    if (number(at + 4) - number(at) > 5000) longest = number(at);
+  }
+  EXPECT_NE(longest, 0);
+  for (int i = 0; i < count; ++i) {
+    for (size_t byte = 0; byte < 4; ++byte) {
+      bytes[kOffsets + 4 * static_cast<size_t>(i) + byte] =
+          static_cast<uint8_t>(longest >> (8 * byte));
+    }
+  }
+  return bytes;
 }
 
 }  // namespace
@@ -115,37 +143,19 @@ TEST(AndroidManifestFacts, WhatDoesNotReadIsNotThere) {
             "");
 }
 
-// All strings of the pool are made the longest one: 40 times as long together as the document.
 TEST(AndroidManifestFacts, DocumentWhoseStringsLieInOneAnotherIsNotRead) {
-  constexpr size_t kPool = 8;          // behind the document's header
-  constexpr size_t kOffsets = 8 + 28;  // behind the pool's
-  CompiledXml xml;
   std::vector<XmlAttribute> attributes = {StringAttribute("package", std::string(5000, 'p'))};
   for (int i = 0; i < 200; ++i) attributes.push_back(IntAttribute("a" + std::to_string(i), 0));
-  xml.Element("manifest", attributes);
-  Bytes bytes = xml.Build();
-  EXPECT_FALSE(ParseAndroidManifest(bytes).has_overlaps);
-  EXPECT_EQ(ParseAndroidManifest(bytes).installer_name, std::string(5000, 'p'));
-  // Which of the strings is the long one: its offset is followed by one that is 5000 more.
-  const auto number = [&bytes](size_t at) {
-    return bytes[at] | bytes[at + 1] << 8 | bytes[at + 2] << 16 | bytes[at + 3] << 24;
-  };
-  const int count = number(kPool + 8);
-  ASSERT_GT(count, 200);
-  int longest = 0;
-  for (int i = 0; i + 1 < count; ++i) {
-    const size_t at = kOffsets + 4 * static_cast<size_t>(i);
-    if (number(at + 4) - number(at) > 5000) longest = number(at);
-  }
-  ASSERT_NE(longest, 0);
-  for (int i = 0; i < count; ++i) {
-    for (size_t byte = 0; byte < 4; ++byte) {
-      bytes[kOffsets + 4 * static_cast<size_t>(i) + byte] =
-          static_cast<uint8_t>(longest >> (8 * byte));
-    }
-  }
-  const AndroidManifest manifest = ParseAndroidManifest(bytes);
+  PackageOptions options;
+  options.android_manifest = CompiledXml().Element("manifest", attributes).Build();
+  EXPECT_FALSE(ParseAndroidManifest(*options.android_manifest).has_overlaps);
+  EXPECT_EQ(ParseAndroidManifest(*options.android_manifest).installer_name, std::string(5000, 'p'));
+  EXPECT_TRUE(LookAt(DiskFile(MakePackage(options).Build()).path()).too_long.empty());
+  options.android_manifest = WithStringsInOneAnother(*options.android_manifest);
+  const AndroidManifest manifest = ParseAndroidManifest(*options.android_manifest);
   EXPECT_TRUE(manifest.has_overlaps);
   EXPECT_EQ(manifest.package_name, std::nullopt);
   EXPECT_EQ(manifest.installer_name, "");
+  EXPECT_EQ(LookAt(DiskFile(MakePackage(options).Build()).path()).too_long,
+            std::vector<std::string>({"AndroidManifest.xml"}));
 }

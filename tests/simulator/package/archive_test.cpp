@@ -6,6 +6,8 @@
 #include <unistd.h>
 
 #include <csignal>
+#include <cstddef>
+#include <functional>
 
 #include "support/files.h"
 #include "support/zip.h"
@@ -115,6 +117,17 @@ TEST(Archive, LongEntriesAreNotRead) {
   EXPECT_EQ(content.size(), Archive::kLongestRead);
 }
 
+// A length that its data cannot have is damage, however long it is.
+TEST(Archive, EntryThatClaimsTooMuchIsDamaged) {
+  const MemoryFile file(BuildZip(
+      {ClaimingLength({"liar", Bytes(100, 'a'), true}, Archive::kLongestRead + 1), Good("a")}));
+  int32_t result = -1;
+  Archive archive(file.fd(), &result);
+  std::vector<uint8_t> content;
+  EXPECT_EQ(archive.Read("liar", &content), Archive::ReadResult::kDamaged);
+  EXPECT_EQ(archive.too_long(), Lines());
+}
+
 // The directory is mapped; its pages behind the new end are gone.
 TEST(Archive, SurvivesAFileThatShrinks) {
   std::vector<ZipItem> items;
@@ -162,6 +175,7 @@ TEST(ArchiveEnd, IsTheLastMarkThatHasRoomForARecord) {
   const auto end_of = [](const std::string& comment) {
     Bytes zip = BuildZip({Good("a")});
     zip[zip.size() - 2] = static_cast<uint8_t>(comment.size());
+    zip[zip.size() - 1] = static_cast<uint8_t>(comment.size() >> 8);
     zip.insert(zip.end(), comment.begin(), comment.end());
     const MemoryFile file(zip);
     const auto end = FindArchiveEnd(file.fd());
@@ -169,10 +183,43 @@ TEST(ArchiveEnd, IsTheLastMarkThatHasRoomForARecord) {
   };
   EXPECT_EQ(end_of(""), 1);
   EXPECT_EQ(end_of("a comment"), 1);
+  EXPECT_EQ(end_of(std::string(65535, 'c')), 1);
   // A mark in the comment that no record follows is no end.
   EXPECT_EQ(end_of(std::string("PK\5\6") + std::string(17, '\0')), 1);
   // With one behind it the platform's library takes it for the end, and so is it taken here.
   EXPECT_EQ(end_of(std::string("PK\5\6") + std::string(18, '\0')), 0);
+}
+
+// The names in the central directory of "a" and "bcd" after `change`, which is given the bytes and
+// where the directory begins in them.
+Lines NamesAfter(const std::function<void(Bytes* zip, ptrdiff_t directory)>& change) {
+  Bytes zip = BuildZip({Good("a"), Good("bcd")});
+  const auto end = FindArchiveEnd(MemoryFile(zip).fd());
+  EXPECT_TRUE(end.has_value());
+  change(&zip, end->directory_offset);
+  const MemoryFile changed(zip);
+  Lines names;
+  for (const ArchiveEntry& entry : ReadDirectory(changed.fd(), *end)) names.push_back(entry.name);
+  return names;
+}
+
+// 46 bytes, the name, and two more fields, whose lengths stand at 30 and 32 (APPNOTE.TXT 4.3.12).
+TEST(ReadDirectory, PassesOverWhatStandsBehindTheNames) {
+  const auto add = [](Bytes* zip, ptrdiff_t directory) {
+    const Bytes more = ToBytes("extracomment");
+    (*zip)[static_cast<size_t>(directory) + 30] = 5;
+    (*zip)[static_cast<size_t>(directory) + 32] = 7;
+    zip->insert(zip->begin() + directory + 47, more.begin(), more.end());
+  };
+  EXPECT_EQ(NamesAfter(add), Lines({"a", "bcd"}));
+}
+
+TEST(ReadDirectory, EndsWhereItIsCutOrHasNoMark) {
+  EXPECT_EQ(NamesAfter([](Bytes*, ptrdiff_t) {}), Lines({"a", "bcd"}));
+  EXPECT_EQ(NamesAfter([](Bytes* zip, ptrdiff_t) { zip->resize(zip->size() - 22 - 1); }),
+            Lines({"a"}));
+  const auto unmark = [](Bytes* zip, ptrdiff_t at) { (*zip)[static_cast<size_t>(at) + 47] = 'p'; };
+  EXPECT_EQ(NamesAfter(unmark), Lines({"a"}));
 }
 
 TEST(ArchiveEnd, MayLieAboutItsDirectory) {

@@ -9,6 +9,7 @@
 #include <cerrno>
 #include <csignal>
 #include <map>
+#include <thread>
 
 #include "simulator/package/signing_block.h"
 #include "support/files.h"
@@ -54,6 +55,9 @@ TEST(FileKind, IsToldByWhatTheFileIs) {
   EXPECT_EQ(FactsOf(ToBytes("<html>404</html>\n")).kind, FileKind::kText);
   EXPECT_EQ(FactsOf(ToBytes("caf\xc3\xa9\t\x1b[1m")).kind, FileKind::kText);
   EXPECT_EQ(FactsOf({'\177', 'E', 'L', 'F', 0}).kind, FileKind::kNoArchive);
+  for (const uint8_t control : {'\6', '\16', '\37', '\177'}) {
+    EXPECT_EQ(FactsOf({'a', control}).kind, FileKind::kNoArchive);
+  }
   const Bytes package = MakePackage().Build();
   EXPECT_EQ(FactsOf(package).kind, FileKind::kArchive);
   EXPECT_EQ(FactsOf({package.begin(), package.begin() + 500}).kind, FileKind::kCutArchive);
@@ -195,6 +199,26 @@ TEST(PackageFacts, DamagedEntriesAreThereAllTheSame) {
   EXPECT_FALSE(facts.libraries[0].is_met);
 }
 
+// Which of them lie behind the damage is up to the library's order.
+TEST(PackageFacts, LibrariesBehindDamageAreNotMet) {
+  PackageOptions options;
+  for (int i = 0; i < 64; ++i) {
+    options.entries.push_back({"lib/arm64-v8a/lib" + std::to_string(i) + ".so", ToBytes("a")});
+  }
+  Package package = MakePackage(options);
+  const auto count_met = [](const PackageFacts& facts) {
+    const auto is_met = [](const LibraryFacts& library) { return library.is_met; };
+    return std::count_if(facts.libraries.begin(), facts.libraries.end(), is_met);
+  };
+  EXPECT_EQ(count_met(FactsOf(package.Build())), 65);
+  for (int i = 20; i < 40; ++i) {
+    package.Item("lib/arm64-v8a/lib" + std::to_string(i) + ".so").local.crc = 1;
+  }
+  const PackageFacts facts = FactsOf(package.Build());
+  EXPECT_EQ(facts.libraries.size(), 65U);
+  EXPECT_LT(count_met(facts), 45) << "those that can be extracted";
+}
+
 TEST(PackageFacts, TellWhatIsTooLongToBeLookedInto) {
   Package package = MakePackage();
   ZipItem& manifest = package.Item(kManifestName);
@@ -206,6 +230,25 @@ TEST(PackageFacts, TellWhatIsTooLongToBeLookedInto) {
   EXPECT_EQ(facts.too_long,
             std::vector<std::string>({kManifestName, "the block of the schemes after v1"}));
   EXPECT_FALSE(facts.has_damaged_signing_block);
+}
+
+// Cut at one moment after another, until it is while the archive is read.
+TEST(PackageFacts, FileThatShrinksMeanwhileWasChanged) {
+  PackageOptions options;
+  for (int i = 0; i < 20000; ++i) options.entries.push_back({"assets/" + std::to_string(i), {}});
+  const Bytes whole = MakePackage(options).Build();
+  const TempDir folder;
+  bool was_changed = false;
+  for (unsigned i = 0; i < 400 && !was_changed; ++i) {
+    const std::string file = folder.Write("base.apk", whole);
+    std::thread cutter([&] {
+      usleep(i % 40 * 1000);
+      EXPECT_EQ(truncate(file.c_str(), 3000), 0);
+    });
+    was_changed = LookAt(file).was_changed;
+    cutter.join();
+  }
+  EXPECT_TRUE(was_changed);
 }
 
 // Told by opening each as the tool does: nothing is waited for.

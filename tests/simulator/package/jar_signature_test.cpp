@@ -103,8 +103,8 @@ TEST(JarSignatureFacts, CertificateThatTheToolDoesNotReadIsNotShown) {
   const auto at = std::search(block.begin(), block.end(), certificate.begin(), certificate.end());
   ASSERT_NE(at, block.end());
   // A0 82 hh ll becomes A0 83 00 hh ll, and what is around it is as long as it says no more.
-  block.insert(at - 2, 0);
-  *(at - 3) = 0x83;
+  const auto inserted = block.insert(at - 2, 0);
+  *(inserted - 1) = 0x83;
   const JarSignatureFacts jar = SignatureOf(package);
   EXPECT_FALSE(jar.block.is_whole);
   EXPECT_FALSE(jar.certificate.has_value());
@@ -115,6 +115,15 @@ TEST(JarSignatureFacts, SignerThatNamesAnotherCertificateIsSeen) {
   options.block.serial = der::Integer(99);
   EXPECT_TRUE(SignatureOf(MakePackage(options)).names_other_certificate);
   EXPECT_FALSE(SignatureOf(MakePackage()).names_other_certificate);
+  // Without a signer that reads there is nobody to name one. The certificate has a key identifier.
+  Certificate certificate;
+  certificate.extensions = {Extension("2.5.29.14", der::OctetString({1, 2, 3}))};
+  options.block.certificates = certificate.Build();
+  options.block.signer_infos = der::Set({});
+  const JarSignatureFacts unsigned_block = SignatureOf(MakePackage(options));
+  ASSERT_TRUE(unsigned_block.certificate.has_value());
+  EXPECT_FALSE(unsigned_block.block.is_whole);
+  EXPECT_FALSE(unsigned_block.names_other_certificate);
 }
 
 TEST(JarSignatureFacts, BlockIsTheOneThatTheToolLooksFor) {

@@ -77,6 +77,23 @@ TEST(SignatureBlockFacts, DigestsThatTheToolDoesNotReadHaveTheirNames) {
   EXPECT_EQ(digest("1.2.3.4"), "1.2.3.4");
 }
 
+// RFC 4056 §3: the signature's algorithm says it, and not the digest's.
+TEST(SignatureBlockFacts, SeeRsassaPss) {
+  const auto has_pss = [](const std::string& digest, const std::string& algorithm) {
+    SignatureBlock block;
+    block.signer_infos = der::Set({der::Sequence(
+        {der::Integer(1), der::Sequence({der::Sequence({}), der::Integer(1)}),
+         AlgorithmIdentifier(digest), AlgorithmIdentifier(algorithm), der::OctetString({1, 2})})});
+    const Bytes der = block.Build(kSignatureFile);
+    const SignatureBlockFacts facts = ParseSignatureBlock(View(der));
+    EXPECT_TRUE(facts.is_whole);
+    return facts.has_pss;
+  };
+  const std::string pss = "1.2.840.113549.1.1.10";
+  EXPECT_TRUE(has_pss(DigestOid(Digest::kSha256), pss));
+  EXPECT_FALSE(has_pss(pss, "1.2.840.113549.1.1.1"));
+}
+
 TEST(SignatureBlockFacts, OfACutBlockAreThoseBeforeTheCut) {
   const Bytes der = SignatureBlock().Build(kSignatureFile);
   for (size_t size = 0; size < der.size(); ++size) {

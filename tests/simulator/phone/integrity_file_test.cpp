@@ -42,6 +42,11 @@ TEST(IntegrityFile, MissingIsNoFile) {
                 {IntegrityEvent(0, nullptr), IntegrityEvent(0, "1f"), IntegrityEvent(0, nullptr)}));
 }
 
+// The digits and the end of the line.
+TEST(IntegrityFile, HoldsALine) {
+  EXPECT_EQ(Probe({"bytes " + kOwn}).Run({"--integrity", "1f"}).results, Lines({"3 77"}));
+}
+
 TEST(IntegrityFile, MayHoldWhatIsNoNumber) {
   const ProbeRun run = Probe({"fopen " + kOwn + " r"}).Run({"--integrity", "zz"});
   EXPECT_EQ(run.results, Lines({"-2 77"}));

@@ -30,7 +30,7 @@ namespace {
 // Writes a record as the platform's C++ libraries do.
 template <typename Data = __android_logger_data, typename Message = __android_log_message>
 void WriteLogRecord(int priority, const char* tag, const char* text) {
-  if constexpr (kLogLibraryHas<Message>) {
+  if constexpr (simulator::kLogLibraryHas<Message>) {
     Message message = {sizeof(message), LOG_ID_MAIN, priority, tag, nullptr, 0, text};
     __android_log_write_log_message(&message);
   } else {
@@ -58,11 +58,11 @@ std::string FromHex(const std::string& digits) {
 // Kept for the life of the process.
 const void* Memory(const std::string& word) {
   if (word == "null") return nullptr;
-  constexpr size_t kPage = 4096;
+  const auto page = static_cast<size_t>(sysconf(_SC_PAGESIZE));
   void* const pages =
-      mmap(nullptr, 2 * kPage, PROT_READ | PROT_WRITE, MAP_PRIVATE | MAP_ANONYMOUS, -1, 0);
-  char* const second = static_cast<char*>(pages) + kPage;
-  munmap(second, kPage);
+      mmap(nullptr, 2 * page, PROT_READ | PROT_WRITE, MAP_PRIVATE | MAP_ANONYMOUS, -1, 0);
+  char* const second = static_cast<char*>(pages) + page;
+  munmap(second, page);
   if (word == "wild") return second;
   // "cut": one of two bytes of data is there.
   if (word == "cut") return memcpy(second - 3, "\2\0a", 3);
@@ -80,6 +80,14 @@ long ReadAndClose(FILE* file) {
   fclose(file);
   errno = before;
   return is_read ? static_cast<long>(value) : -2;
+}
+
+// How many bytes there are in it.
+long CountAndClose(FILE* file) {
+  char bytes[64];
+  const size_t count = fread(bytes, 1, sizeof(bytes), file);
+  fclose(file);
+  return static_cast<long>(count);
 }
 
 // Writes to what was opened for reading.
@@ -127,6 +135,7 @@ const std::map<std::string, Command> kCommands = {
     {"close", [](const Words& w) { return close(Int(w[1])); }},
     {"fopen", [](const Words& w) { return ReadAndClose(fopen(w[1].c_str(), w[2].c_str())); }},
     {"fopen64", [](const Words& w) { return ReadAndClose(fopen64(w[1].c_str(), w[2].c_str())); }},
+    {"bytes", [](const Words& w) { return CountAndClose(fopen(w[1].c_str(), "r")); }},
     {"keep", [](const Words& w) { return fileno(fopen(w[1].c_str(), "r")); }},
     {"write", [](const Words& w) { return WriteAndClose(fopen(w[1].c_str(), "r")); }},
     {"own-task",
@@ -162,6 +171,7 @@ const std::map<std::string, Command> kCommands = {
     {"pid", WriteId},
     {"has-variable", [](const Words& w) { return getenv(w[1].c_str()) == nullptr ? 0L : 1L; }},
     {"exit", [](const Words& w) -> long { _exit(Int(w[1])); }},
+    {"ignore", [](const Words& w) { return signal(Int(w[1]), SIG_IGN) == SIG_ERR ? -1L : 0L; }},
     {"kill", [](const Words& w) { return raise(Int(w[1])); }},
     {"sleep", [](const Words& w) { return sleep(static_cast<unsigned>(Int(w[1]))); }},
 };

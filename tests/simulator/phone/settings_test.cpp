@@ -54,6 +54,12 @@ TEST(PhoneEnvironment, EverySettingArrives) {
   EXPECT_EQ(phone.zu_result, -3);
 }
 
+// No file has the inode 0.
+TEST(PhoneEnvironment, FileThatIsNotNamedByDeviceAndInodeIsNone) {
+  const Environment environment({"APKTOOLKIT_SIM_TRUST=5,6:7"});
+  EXPECT_EQ(SettingsFromEnvironment().trusted, std::vector<FileId>({{0, 0}, {6, 7}}));
+}
+
 TEST(PhoneEnvironment, IsWrittenAsItIsRead) {
   PhoneSettings phone;
   phone.journal = "/with space";

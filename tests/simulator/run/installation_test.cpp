@@ -9,6 +9,7 @@
 #include <algorithm>
 #include <csignal>
 #include <filesystem>
+#include <thread>
 
 #include "support/compiled_manifest.h"
 #include "support/files.h"
@@ -70,6 +71,9 @@ TEST(Installation, TakesTheProcessorsThatAreAskedFor) {
   EXPECT_EQ(LaidOut(kBoth, InstalledAbi::kArm64), Files({"lib/arm64/liba.so 64"}));
   EXPECT_EQ(LaidOut(kBoth, InstalledAbi::kArm), Files({"lib/arm/liba.so 32"}));
   EXPECT_EQ(LaidOut({kBoth[2]}, InstalledAbi::kAll), Files({"lib/arm/liba.so old"}));
+  // Of two ABIs for one processor, the second is left alone, whatever its libraries are called.
+  EXPECT_EQ(LaidOut({kBoth[1], {"lib/armeabi/libb.so", ToBytes("old")}}, InstalledAbi::kAll),
+            Files({"lib/arm/liba.so 32"}));
 }
 
 TEST(Installation, WithoutLibrariesToLayOutThePackageStaysWhereItIs) {
@@ -105,6 +109,40 @@ TEST(Installation, NamesDoNotLeadOutOfTheirFolder) {
   std::sort(left_out.begin(), left_out.end());
   EXPECT_EQ(left_out, Files({"lib/arm64-v8a/../../../outside.so", "lib/arm64-v8a/sub/libb.so",
                              "lib/libd.so"}));
+}
+
+// A name has at most 255 bytes.
+TEST(Installation, NamesThatNoFileCanHaveAreLeftOut) {
+  const std::string longest = std::string(252, 'l') + ".so";
+  Files left_out;
+  EXPECT_EQ(LaidOut({{"lib/arm64-v8a/" + longest, ToBytes("good")},
+                     {"lib/arm64-v8a/l" + longest, ToBytes("bad")}},
+                    InstalledAbi::kAll, &left_out),
+            Files({"lib/arm64/" + longest + " good"}));
+  EXPECT_EQ(left_out, Files({"lib/arm64-v8a/l" + longest}));
+}
+
+// Cut at one moment after another, until it is while the libraries are extracted.
+TEST(Installation, OfAFileThatShrinksMeanwhileIsNone) {
+  std::vector<ZipItem> libraries;
+  for (int i = 0; i < 1000; ++i) {
+    libraries.push_back({"lib/arm64-v8a/" + std::to_string(i) + ".so", {}});
+  }
+  const Bytes whole = MakePackage(WithLibraries(libraries)).Build();
+  const TempDir folder;
+  bool is_told = false;
+  for (unsigned i = 0; i < 400 && !is_told; ++i) {
+    const std::string file = folder.Write("base.apk", whole);
+    std::thread cutter([&] {
+      usleep(i % 40 * 1000);
+      EXPECT_EQ(truncate(file.c_str(), 3000), 0);
+    });
+    Installation installation;
+    is_told =
+        installation.LayOut(file, InstalledAbi::kAll, kLater) == "it became shorter meanwhile";
+    cutter.join();
+  }
+  EXPECT_TRUE(is_told);
 }
 
 TEST(Installation, TellsWhatCannotBeExtracted) {

@@ -32,6 +32,8 @@ TEST(SignedBytes, AreTrustedUnderAnyNameWhileTheyStayTheSame) {
   EXPECT_TRUE(bytes.Holds(copy, kLater));
   folder.Write("file", ToBytes("abd"));
   EXPECT_FALSE(bytes.Holds(file, kLater));
+  folder.Write("file", ToBytes("abcd"));
+  EXPECT_FALSE(bytes.Holds(file, kLater));
 }
 
 TEST(SignedBytes, OfTheSameFileAreTrustedUnlessItWasTouched) {
@@ -106,6 +108,21 @@ TEST(SignedBytes, AreKeptByTheirDigest) {
   SignedBytes second(directory, true);
   ASSERT_TRUE(second.Load());
   EXPECT_TRUE(second.Holds(file, kLater));
+}
+
+TEST(SignedBytes, ThatAreNotSharedAreForLaterRunsAlone) {
+  const TempDir folder;
+  const std::string file = folder.Write("file", ToBytes("abc"));
+  SignedBytes none("", false);
+  EXPECT_TRUE(none.Add(file, kLater));
+  EXPECT_FALSE(none.Holds(file, kLater));
+  SignedBytes kept(folder / "state", false);
+  ASSERT_TRUE(kept.Load());
+  EXPECT_TRUE(kept.Add(file, kLater));
+  EXPECT_FALSE(kept.Holds(file, kLater));
+  SignedBytes later(folder / "state", false);
+  ASSERT_TRUE(later.Load());
+  EXPECT_TRUE(later.Holds(file, kLater));
 }
 
 TEST(SignedBytes, OfAFileThatCannotBeReadAreNeverTrusted) {

@@ -211,6 +211,17 @@ TEST(Page, DrawsEachPartOfThePackage) {
                   "<td class=\"number\">30.0</td>"));
 }
 
+TEST(Page, GroupsTheDigitsOfNumbers) {
+  Report report = Example(Verdict::kSigned);
+  for (const auto& [bytes, shown] :
+       {std::pair(999U, "999"), std::pair(1234U, "1,234"), std::pair(12345U, "12,345"),
+        std::pair(1234567U, "1,234,567")}) {
+    report.protection.verified = {1, bytes};
+    EXPECT_TRUE(Has(PageOf(report), std::string("<td class=\"number\">") + shown + "</td>"))
+        << bytes;
+  }
+}
+
 TEST(Page, ShowsWhereTheChainBreaks) {
   const std::string page = PageOf(HostileReport("x"));
   EXPECT_TRUE(Has(page, "<span class=\"link\">key</span> <span class=\"at\">x</span>"));
@@ -226,7 +237,7 @@ TEST(Page, TellsSchemesOfOneCertificateTogether) {
   CertificateFacts other;
   other.sha256 = "2";
   report.signer = one;
-  report.newer = {{"v2", one}, {"v3", other}, {"v3", one}};
+  report.newer = {{"v2", one}, {"v2", one}, {"v3", other}, {"v3", one}};
   const std::string page = PageOf(report);
   EXPECT_EQ(Count(page, "<h4>"), 2U);
   EXPECT_TRUE(Has(page, "<h4>Signed with v1, v2, v3</h4>"));

@@ -158,6 +158,22 @@ TEST(ReportText, RefusalsAreRedAndTheGoodVerdictIsGreen) {
   EXPECT_EQ(lines[3].substr(0, 5), "\x1b[31m");
 }
 
+// Names of up to 40 characters make the column, and longer ones stand out of it.
+TEST(ReportText, OneLongNameMovesNoOther) {
+  const std::string longest(40, 'l');
+  const auto column = [&](const std::string& other) {
+    Report report = Example();
+    report.items = {{ItemKind::kLibrary, "a", "", ItemState::kDone, {}},
+                    {ItemKind::kLibrary, other, "", ItemState::kDone, {}}};
+    const Lines lines = LinesOf(Printed(report, kAscii));
+    EXPECT_EQ(lines[2], "  + " + other + "  signed");
+    return lines[1].find("signed");
+  };
+  EXPECT_EQ(column("bcd"), 4U + 3 + 2);
+  EXPECT_EQ(column(longest), 4U + 40 + 2);
+  EXPECT_EQ(column(longest + "l"), 4U + 40 + 2);
+}
+
 // A cure that many have in common is said once.
 TEST(ReportText, NeighboursShareWhatToDo) {
   Report report = Example();

@@ -108,6 +108,27 @@ TEST(Timeline, EmptyPayloadIsCalledSo) {
 )");
 }
 
+// 32 bytes are one.
+TEST(Timeline, OnlyAPayloadOfADigestsLengthIsCalledOne) {
+  const auto payload = [](const std::string& data) {
+    const Events events = ParseEvents("{\"event\":\"sign\",\"path\":\"/a\",\"payload\":\"0000" +
+                                      data + "\",\"result\":0}\n");
+    return MakeTimeline(events, "/a").at(0).detail;
+  };
+  EXPECT_EQ(payload("abcdef"), "payload: length 3, abcdef");
+  EXPECT_EQ(payload(kDigest + "77"), "payload: length 33, " + kDigest + "77");
+  EXPECT_EQ(payload(kDigest), "payload: length 32, SHA-256 digest of the signer's key " + kDigest);
+}
+
+TEST(Timeline, EndsThatAreFailuresAreMarked) {
+  const auto is_failure = [](const std::string& end) {
+    return MakeTimeline(ParseEvents("{\"event\":\"exit\"," + end + "}\n"), "/a").at(0).is_failure;
+  };
+  EXPECT_FALSE(is_failure("\"status\":0"));
+  EXPECT_TRUE(is_failure("\"status\":1"));
+  EXPECT_TRUE(is_failure("\"signal\":9"));
+}
+
 TEST(Timeline, NothingIsPrintedThatATerminalWouldObey) {
   const std::string journal =
       kStart + R"({"event":"log","priority":4,"tag":"\u001b[2J","text":"a\u0007\u009b\uf7e9é\nb\n"}

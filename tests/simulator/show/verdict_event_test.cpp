@@ -159,6 +159,7 @@ TEST(VerdictEvent, EveryKindAndStateHasACode) {
   EXPECT_EQ(item(ItemKind::kEntries, ItemState::kRefused), "entries refused");
   EXPECT_EQ(item(ItemKind::kLibrary, ItemState::kAbsent), "library absent");
   EXPECT_EQ(item(ItemKind::kKey, ItemState::kDone), "key registered");
+  EXPECT_EQ(item(ItemKind::kKey, ItemState::kRefused), "key refused");
   EXPECT_EQ(item(ItemKind::kTool, ItemState::kNothing), "tool nothing-to-sign");
   EXPECT_EQ(item(ItemKind::kInstaller, ItemState::kRefused), "installer refused");
 }

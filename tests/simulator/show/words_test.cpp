@@ -70,6 +70,10 @@ TEST(HeadFacts, NameTheSignerAndTheKernelsKey) {
             Lines({"com.app", "signer CN=a, RSA-2048, key 98302ce8...f64646"}));
   report.key->bits = 0;
   EXPECT_EQ(HeadFacts(report, "…")[1], "signer CN=a, RSA, key 98302ce8…f64646");
+  // A payload may be anything, and have too few digits to leave some out.
+  report.key->sha256 = "ab";
+  EXPECT_EQ(HeadFacts(report, "…")[1], "signer CN=a, RSA, key ab");
+  report.key->sha256 = "98302ce800f64646";
   report.signer.reset();
   report.package_name = "";
   EXPECT_EQ(HeadFacts(report, "..."), Lines({"signer unknown, RSA, key 98302ce8...f64646"}));

@@ -145,6 +145,8 @@ TEST(MakeReport, LibraryWithOtherBytesIsRefused) {
   EXPECT_EQ(report.verdict, Verdict::kPartlySigned);
   EXPECT_EQ(ItemsOf(report),
             Lines({"package done", "lib/arm64/libfoo.so refused library-changed"}));
+  EXPECT_TRUE(report.items[0].is_verified);
+  EXPECT_FALSE(report.items[1].is_verified);
 }
 
 // The library's item where this is logged of it, and opening it ends like this.
@@ -247,11 +249,33 @@ TEST(MakeReport, DamagedEntriesAreADoubtAndForTheStrictARefusal) {
             Lines({"package done", "entries refused entries-damaged 2 entries: res/a, ..."}));
 }
 
+TEST(MakeReport, OtherWarningsAreNoRefusalForTheStrict) {
+  PackageFacts facts;
+  facts.was_changed = true;
+  const Report report = Made({kFileStart, Sign(kFile, kPackagePayload)}, facts, {true});
+  EXPECT_EQ(ItemsOf(report), Lines({"package done"}));
+  ASSERT_EQ(report.warnings.size(), 1U);
+  EXPECT_EQ(report.warnings[0].cause, &cause::kFileChanged);
+}
+
 TEST(MakeReport, LibraryThatVanishedIsRefused) {
   EXPECT_EQ(Items({kLibrariesStart, Log(6, "File " + kLibrary + " is not opened"),
                    Log(6, "Error 2: No such file or directory.\n"), kFileStart,
                    Sign(kFile, kPackagePayload)})[1],
             "lib/arm64/libfoo.so refused library-not-opened ENOENT: No such file or directory");
+}
+
+TEST(MakeReport, EachVanishedLibraryHasItsOwnError) {
+  const Lines items = Items({kLibrariesStart, Log(6, "File /data/app/a.so is not opened"),
+                             Log(6, "Error 2: x.\n"), Log(6, "File /data/app/b.so is not opened"),
+                             Log(6, "Error 13: x.\n"), kFileStart, Sign(kFile, kPackagePayload)});
+  EXPECT_EQ(items[1], "a.so refused library-not-opened ENOENT: No such file or directory");
+  EXPECT_EQ(items[2], "b.so refused library-not-opened EACCES: Permission denied");
+}
+
+TEST(MakeReport, ErrorThatNoLineTellsTheUseOfCounts) {
+  EXPECT_EQ(Items({kFileStart, Sign(kFile, kPackagePayload), Log(6, "Can't open file: x\n")}),
+            Lines({"package done", "tool refused tool-error Can't open file: x"}));
 }
 
 TEST(MakeReport, LibrariesOfOtherProcessorsAreNothingToSign) {
@@ -273,6 +297,7 @@ TEST(MakeReport, LibrariesOfARefusedPackageFollowIt) {
                              facts);
   EXPECT_EQ(report.verdict, Verdict::kRefused);
   EXPECT_EQ(ItemsOf(report)[1], "lib/arm64/libfoo.so refused package-refused");
+  EXPECT_FALSE(report.items[0].is_verified);
 }
 
 // The tool names no path when it may not sign; the order of the libraries tells which it was.
@@ -289,6 +314,16 @@ TEST(MakeReport, LibrariesThatTheKernelWasNotAskedForAreKnownByTheirOrder) {
                                     "lib/arm64/libb.so refused integrity-zero"}));
 }
 
+TEST(MakeReport, LibrariesBehindTheToolsEndAreNotReached) {
+  const Report report = Made({kLibrariesStart, kTakesUp, Integrity("1f"),
+                              Sign("/data/app/lib/arm64/liba.so", kPackagePayload)},
+                             WithLibraries({"lib/arm64-v8a/liba.so", "lib/arm64-v8a/libb.so"}), {},
+                             {{"event", "exit"}, {"signal", 9}});
+  EXPECT_EQ(ItemsOf(report),
+            Lines({"package refused not-reached", "lib/arm64/liba.so done",
+                   "lib/arm64/libb.so refused not-reached", "tool refused tool-killed 9"}));
+}
+
 TEST(MakeReport, IntegrityValuesAreReadAsTheToolReadsThem) {
   const auto reason = [](const Json& value) {
     return Items({kFileStart, kTakesUp, Integrity(value), CannotSign(2)})[0];
@@ -298,6 +333,30 @@ TEST(MakeReport, IntegrityValuesAreReadAsTheToolReadsThem) {
   EXPECT_EQ(reason("none"), "package refused integrity-unreadable none");
   EXPECT_EQ(reason(""), "package refused integrity-unreadable");
   EXPECT_EQ(reason(nullptr), "package refused integrity-missing");
+}
+
+// Payload and key are those that the kernel got, with the package or else with a library. The
+// tool's own code is asked where it got none.
+TEST(MakeReport, KeyIsTheOneThatTheKernelGot) {
+  const std::string own(64, 'a'), other(64, 'b');
+  PackageFacts facts = WithLibraries({"lib/arm64-v8a/libfoo.so"});
+  facts.jar.key = ToolKey{own, 256, 2048, 65537, false};
+  const auto told = [&facts](const Events& events) {
+    const Report report = Made(events, facts);
+    return report.key->sha256.substr(0, 1) + " " + std::to_string(report.key->bits) +
+           (report.key->was_got ? " got " : " not got ") + report.payload.substr(0, 5);
+  };
+  const Events library = {kLibrariesStart, kTakesUp, Sign(kLibrary, "2000" + other)};
+  EXPECT_EQ(told({kFileStart, kTakesUp, Sign(kFile, "2000" + own)}), "a 2048 got 2000a");
+  EXPECT_EQ(told({kFileStart, kTakesUp, Sign(kFile, "2000" + other)}), "b 0 got 2000b");
+  EXPECT_EQ(told({kFileStart, kTakesUp, Sign(kFile, "2000" + other, EPERM)}), "a 2048 not got ");
+  EXPECT_EQ(
+      told({library[0], library[1], library[2], kFileStart, kTakesUp, Sign(kFile, "2000" + own)}),
+      "a 2048 got 2000a");
+  EXPECT_EQ(told({library[0], library[1], library[2], kFileStart, kTakesUp,
+                  Sign(kFile, "2000" + own, EPERM)}),
+            "b 0 got 2000b");
+  EXPECT_EQ(told({Log(6, "Can't validate manifest.\n")}), "a 2048 not got ");
 }
 
 // Of one file as well, and of a library whose path nobody told.

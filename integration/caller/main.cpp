@@ -1,0 +1,73 @@
+// apktoolkit-all DIRECTORY LIST: has every installed package signed, after an update of the system.
+// The file LIST has a line "DIGEST[,DIGEST]... PATH" for each, as the package manager knows their
+// signers (SignerDigests.java); what came of each is printed. DIRECTORY is where the programs lie:
+// /system/bin.
+//
+// It passes over files that the kernel trusts already. A run that was cut off can be started again.
+// The exit status: 0 all are trusted, 1 some are not, 2 the command line or the list is wrong.
+#include <algorithm>
+#include <cerrno>
+#include <cstdio>
+#include <cstdlib>
+#include <cstring>
+#include <string>
+
+#include "integration/caller/sign_package.h"
+
+namespace {
+
+constexpr int kAllTrusted = 0;
+constexpr int kNotAllTrusted = 1;
+constexpr int kWrongInput = 2;
+
+// The next line without its end; false at the end of the file.
+bool ReadLine(FILE* list, std::string* line) {
+  char* text = nullptr;
+  size_t size = 0;
+  const ssize_t length = getline(&text, &size, list);
+  if (length > 0) line->assign(text, static_cast<size_t>(length));
+  free(text);
+  if (length > 0 && line->back() == '\n') line->pop_back();
+  return length > 0;
+}
+
+// The signers may be none; the path is absolute, and may have blanks.
+bool Parse(const std::string& line, InstalledPackage* package) {
+  const size_t blank = line.find(' ');
+  if (blank == std::string::npos || line.compare(blank, 2, " /") != 0) return false;
+  *package = {line.substr(blank + 1), line.substr(0, blank)};
+  return true;
+}
+
+bool HasTrust(SignOutcome outcome) {
+  return outcome == SignOutcome::kTrustedAlready || outcome == SignOutcome::kTrusted;
+}
+
+}  // namespace
+
+int main(int argc, char* argv[]) {
+  if (argc != 3) {
+    fputs("usage: apktoolkit-all DIRECTORY LIST\n", stderr);
+    return kWrongInput;
+  }
+  FILE* const list = fopen(argv[2], "re");
+  if (list == nullptr) {
+    fprintf(stderr, "apktoolkit-all: cannot open %s: %s\n", argv[2], strerror(errno));
+    return kWrongInput;
+  }
+  int status = kAllTrusted;
+  for (std::string line; ReadLine(list, &line);) {
+    InstalledPackage package;
+    if (!Parse(line, &package)) {
+      fprintf(stderr, "apktoolkit-all: no line of signers and path: %s\n", line.c_str());
+      status = kWrongInput;
+      continue;
+    }
+    const SignOutcome outcome = SignPackage(argv[1], package, RunLimits());
+    if (!HasTrust(outcome)) status = std::max(status, kNotAllTrusted);
+    printf("%s: %s\n", package.path.c_str(), Describe(outcome));
+    fflush(stdout);  // for whoever watches
+  }
+  fclose(list);
+  return status;
+}

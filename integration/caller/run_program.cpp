@@ -1,0 +1,125 @@
+#include "integration/caller/run_program.h"
+
+#include <fcntl.h>
+#include <signal.h>
+#include <sys/resource.h>
+#include <sys/wait.h>
+#include <time.h>
+#include <unistd.h>
+
+#include <algorithm>
+#include <cerrno>
+
+namespace {
+
+// Of a child that could not become the program. The kit's programs end with less.
+constexpr int kCannotBecome = 127;
+
+// All that the child needs, made before the fork: the child of a process with several threads must
+// not take a lock, and so must not allocate.
+struct Child {
+  std::vector<char*> arguments;  // ends with a null pointer
+  int null;                      // /dev/null, behind the standard streams
+  int descriptors;               // there is none from this number on
+  rlim_t memory_bytes;
+};
+
+std::vector<char*> Arguments(const std::vector<std::string>& command);
+int OpenNull();
+[[noreturn]] void Become(const Child& child);
+RunResult Wait(pid_t child, int milliseconds);
+RunResult Kill(pid_t child);
+RunResult Describe(int status);
+long long Now();
+void Sleep(long long milliseconds);
+
+}  // namespace
+
+RunResult RunProgram(const std::vector<std::string>& command, const RunLimits& limits) {
+  const Child child = {Arguments(command), OpenNull(), static_cast<int>(sysconf(_SC_OPEN_MAX)),
+                       limits.memory_bytes};
+  if (child.null < 0) return {RunEnd::kNotStarted, errno};
+  const pid_t pid = fork();
+  const int error = errno;
+  if (pid == 0) Become(child);
+  close(child.null);
+  if (pid < 0) return {RunEnd::kNotStarted, error};
+  return Wait(pid, limits.milliseconds);
+}
+
+namespace {
+
+std::vector<char*> Arguments(const std::vector<std::string>& command) {
+  std::vector<char*> arguments;
+  arguments.reserve(command.size() + 1);
+  for (const std::string& word : command) arguments.push_back(const_cast<char*>(word.c_str()));
+  arguments.push_back(nullptr);
+  return arguments;
+}
+
+// Behind the standard streams also where this process has none of its own: what dup2 finds in its
+// place already would stay closed by exec.
+int OpenNull() {
+  const int first = open("/dev/null", O_RDWR | O_CLOEXEC);
+  if (first < 0) return first;
+  const int null = fcntl(first, F_DUPFD_CLOEXEC, STDERR_FILENO + 1);
+  const int error = errno;
+  close(first);
+  errno = error;
+  return null;
+}
+
+// The streams have to be open: the tool refuses a file that gets descriptor 0.
+void Become(const Child& child) {
+  for (const int stream : {STDIN_FILENO, STDOUT_FILENO, STDERR_FILENO}) dup2(child.null, stream);
+  for (int fd = STDERR_FILENO + 1; fd < child.descriptors; ++fd) close(fd);
+  const rlimit memory = {child.memory_bytes, child.memory_bytes};
+  if (child.memory_bytes != 0 && setrlimit(RLIMIT_DATA, &memory) != 0) _exit(kCannotBecome);
+  sigset_t none;
+  sigemptyset(&none);
+  sigprocmask(SIG_SETMASK, &none, nullptr);
+  execv(child.arguments[0], child.arguments.data());
+  _exit(kCannotBecome);
+}
+
+RunResult Wait(pid_t child, int milliseconds) {
+  constexpr long long kLongestNap = 50;
+  const long long deadline = Now() + milliseconds;
+  for (long long nap = 1;; nap = std::min(2 * nap, kLongestNap)) {
+    int status = 0;
+    const pid_t ended = waitpid(child, &status, WNOHANG);
+    if (ended == child) return Describe(status);
+    if (ended < 0 && errno != EINTR) return {RunEnd::kLost, errno};
+    const long long left = deadline - Now();
+    if (left <= 0) return Kill(child);
+    Sleep(std::min(nap, left));
+  }
+}
+
+RunResult Kill(pid_t child) {
+  kill(child, SIGKILL);
+  while (waitpid(child, nullptr, 0) < 0 && errno == EINTR) {
+  }
+  return {RunEnd::kTimedOut, 0};
+}
+
+RunResult Describe(int status) {
+  if (WIFSIGNALED(status)) return {RunEnd::kKilled, WTERMSIG(status)};
+  if (WEXITSTATUS(status) == kCannotBecome) return {RunEnd::kNotStarted, 0};
+  return {RunEnd::kExited, WEXITSTATUS(status)};
+}
+
+// Milliseconds of a clock that nobody sets.
+long long Now() {
+  timespec now = {};
+  clock_gettime(CLOCK_MONOTONIC, &now);
+  return now.tv_sec * 1000LL + now.tv_nsec / 1000000;
+}
+
+void Sleep(long long milliseconds) {
+  const timespec time = {static_cast<time_t>(milliseconds / 1000),
+                         static_cast<long>(milliseconds % 1000 * 1000000)};
+  nanosleep(&time, nullptr);
+}
+
+}  // namespace

@@ -1,0 +1,76 @@
+#include "integration/caller/sign_package.h"
+
+#include <signal.h>
+
+namespace {
+
+// Statuses of apktoolkit-bound; others are the tool's.
+constexpr int kStatusOtherSigner = 3;
+constexpr int kStatusNoJarSigner = 4;
+constexpr int kStatusNotStarted = 5;
+
+bool IsTrusted(const std::string& directory, const std::string& path, const RunLimits& limits) {
+  const RunResult run = RunProgram({directory + "/apktoolkit-verify", path}, limits);
+  return run.end == RunEnd::kExited && run.value == 0;
+}
+
+// Why the kernel does not trust the package after this run.
+SignOutcome WhyNotTrusted(const RunResult& run) {
+  switch (run.end) {
+    case RunEnd::kTimedOut:
+      return SignOutcome::kTimedOut;
+    case RunEnd::kKilled:
+      return run.value == SIGABRT ? SignOutcome::kOutOfMemory : SignOutcome::kNotTrusted;
+    case RunEnd::kNotStarted:
+      return SignOutcome::kCannotBeRun;
+    case RunEnd::kLost:
+      return SignOutcome::kNotTrusted;
+    case RunEnd::kExited:
+      break;
+  }
+  switch (run.value) {
+    case kStatusOtherSigner:
+      return SignOutcome::kOtherSigner;
+    case kStatusNoJarSigner:
+      return SignOutcome::kNoJarSigner;
+    case kStatusNotStarted:
+      return SignOutcome::kCannotBeRun;
+    default:
+      return SignOutcome::kNotTrusted;
+  }
+}
+
+}  // namespace
+
+SignOutcome SignPackage(const std::string& directory, const InstalledPackage& package,
+                        const RunLimits& limits) {
+  if (IsTrusted(directory, package.path, limits)) return SignOutcome::kTrustedAlready;
+  const RunResult run = RunProgram({directory + "/apktoolkit-bound", package.signer_digests,
+                                    directory + "/apktoolkit", package.path},
+                                   limits);
+  // Whatever came of the run: the exit status of the tool tells nothing, the kernel does.
+  if (IsTrusted(directory, package.path, limits)) return SignOutcome::kTrusted;
+  return WhyNotTrusted(run);
+}
+
+const char* Describe(SignOutcome outcome) {
+  switch (outcome) {
+    case SignOutcome::kTrustedAlready:
+      return "trusted already";
+    case SignOutcome::kTrusted:
+      return "trusted";
+    case SignOutcome::kOtherSigner:
+      return "not trusted: its JAR signature is of another signer than the package manager's";
+    case SignOutcome::kNoJarSigner:
+      return "not trusted: it has no JAR signature that holds";
+    case SignOutcome::kNotTrusted:
+      return "not trusted: the log of apktoolkit tells why";
+    case SignOutcome::kTimedOut:
+      return "not trusted: apktoolkit took too long and was killed";
+    case SignOutcome::kOutOfMemory:
+      return "not trusted: apktoolkit ran out of memory";
+    case SignOutcome::kCannotBeRun:
+      return "not trusted: apktoolkit or apktoolkit-bound cannot be started";
+  }
+  return "";
+}

@@ -1,0 +1,81 @@
+// apktoolkit-bound DIGESTS COMMAND... FILE: runs `COMMAND... FILE` if the package FILE has the JAR
+// signer that the package manager knows, and ends with a status of its own if not.
+//
+// The package manager goes by the newer signing block and apktoolkit by the JAR signature, and
+// nobody else compares the two (docs/threat-model.md, "Before you ship it"). DIGESTS is what
+// SignerDigests.java makes of the package manager's signers: the SHA-256 digest of each RSA
+// modulus, in lower-case hexadecimal, with commas between. The JAR's signer is taken by the tool's
+// own code, so that both mean the same one. A package is looked at in a process of its own, because
+// the tool's code ends the process where there is no memory, and does not give everything back.
+#include <fcntl.h>
+#include <unistd.h>
+
+#include <cerrno>
+#include <cstdio>
+#include <cstring>
+#include <string>
+#include <string_view>
+#include <vector>
+
+#include "apk/apk.h"
+#include "util/digest.h"
+#include "util/scoped_fd.h"
+
+namespace {
+
+// Beside those of the command, which is apktoolkit with its 0 and 1.
+constexpr int kUsageError = 2;
+constexpr int kOtherSigner = 3;
+constexpr int kNoJarSigner = 4;
+constexpr int kNotStarted = 5;
+
+// The digest of the key whose signatures over the signature file and over its own certificate hold,
+// or nothing where there is none. The tool makes its payload of the same.
+std::string JarSigner(const char* file) {
+  const ScopedFd fd(open(file, O_RDONLY | O_NONBLOCK | O_CLOEXEC));
+  if (fd.get() < 0) return {};
+  const ApkTools::Apk apk(fd.get());
+  if (!apk.IsApk() || apk.GetManufacturerKey().empty()) return {};
+  std::vector<uint8_t> digest;
+  ComputeSHA256Digest(apk.GetManufacturerKey(), digest);
+  std::string digits;
+  for (const uint8_t byte : digest) {
+    char two[3];
+    snprintf(two, sizeof(two), "%02x", static_cast<unsigned>(byte));
+    digits += two;
+  }
+  return digits;
+}
+
+// Whether `wanted` is one of the words between the commas.
+bool IsAmong(std::string_view words, std::string_view wanted) {
+  while (true) {
+    const size_t comma = words.find(',');
+    if (words.substr(0, comma) == wanted) return true;
+    if (comma == std::string_view::npos) return false;
+    words.remove_prefix(comma + 1);
+  }
+}
+
+}  // namespace
+
+int main(int argc, char* argv[]) {
+  if (argc < 4) {
+    fputs("usage: apktoolkit-bound DIGEST[,DIGEST]... COMMAND... FILE\n", stderr);
+    return kUsageError;
+  }
+  const char* const file = argv[argc - 1];
+  const std::string signer = JarSigner(file);
+  if (signer.empty()) {
+    fprintf(stderr, "apktoolkit-bound: %s has no JAR signature that holds\n", file);
+    return kNoJarSigner;
+  }
+  if (!IsAmong(argv[1], signer)) {
+    fprintf(stderr, "apktoolkit-bound: %s: the JAR signer %s is none of the package's signers %s\n",
+            file, signer.c_str(), argv[1]);
+    return kOtherSigner;
+  }
+  execv(argv[2], &argv[2]);
+  fprintf(stderr, "apktoolkit-bound: cannot start %s: %s\n", argv[2], strerror(errno));
+  return kNotStarted;
+}

@@ -1,0 +1,36 @@
+import android.content.pm.Signature;
+import android.content.pm.SigningInfo;
+import apktoolkit.SignerDigests;
+import com.android.apksig.ApkVerifier;
+import java.io.File;
+import java.security.cert.X509Certificate;
+import java.util.List;
+
+/**
+ * PrintSignerDigests LEVEL FILE [JAR-SIGNER]: prints what SignerDigests makes of the signers that the
+ * package manager of this API level has for the package; or, with a third word, whether that is one
+ * of them. Fails where the package manager would refuse the package.
+ */
+public final class PrintSignerDigests {
+    public static void main(String[] words) throws Exception {
+        int level = Integer.parseInt(words[0]);
+        ApkVerifier.Result result =
+                new ApkVerifier.Builder(new File(words[1]))
+                        .setMinCheckedPlatformVersion(level)
+                        .setMaxCheckedPlatformVersion(level)
+                        .build()
+                        .verify();
+        if (!result.isVerified()) {
+            System.err.println(result.getErrors());
+            System.exit(1);
+        }
+        List<X509Certificate> certificates = result.getSignerCertificates();
+        Signature[] signers = new Signature[certificates.size()];
+        for (int i = 0; i < signers.length; ++i) {
+            signers[i] = new Signature(certificates.get(i).getEncoded());
+        }
+        String digests =
+                level < 28 ? SignerDigests.of(signers) : SignerDigests.of(new SigningInfo(signers));
+        System.out.println(words.length < 3 ? digests : SignerDigests.isAmong(digests, words[2]));
+    }
+}

@@ -1,0 +1,144 @@
+#include "integration/caller/run_program.h"
+
+#include <fcntl.h>
+#include <gtest/gtest.h>
+#include <pthread.h>
+#include <sys/resource.h>
+#include <sys/wait.h>
+#include <unistd.h>
+
+#include <cerrno>
+#include <chrono>
+#include <csignal>
+
+#include "support/files.h"
+
+namespace {
+
+// A shell that runs `script`; what it prints goes to the file $0.
+RunResult Shell(const std::string& script, const std::string& file = "/dev/null",
+                const RunLimits& limits = {}) {
+  return RunProgram({"/bin/sh", "-c", "exec >\"$0\"; " + script, file}, limits);
+}
+
+// What the script prints.
+std::string Printed(const std::string& script, const RunLimits& limits = {}) {
+  const TempDir folder;
+  const RunResult run = Shell(script, folder / "output", limits);
+  EXPECT_EQ(run.end, RunEnd::kExited);
+  return ContentOf(folder / "output");
+}
+
+void Expect(const RunResult& run, RunEnd end, int value) {
+  EXPECT_EQ(run.end, end);
+  EXPECT_EQ(run.value, value);
+}
+
+TEST(RunProgram, TellsTheExitStatus) {
+  Expect(Shell("exit 0"), RunEnd::kExited, 0);
+  Expect(Shell("exit 1"), RunEnd::kExited, 1);
+  Expect(RunProgram({"/bin/false"}, {}), RunEnd::kExited, 1);
+}
+
+TEST(RunProgram, HandsOverEachArgument) {
+  EXPECT_EQ(Printed("echo \"$#\""), "0\n");
+  const TempDir folder;
+  const std::string file = folder / "output";
+  RunProgram({"/bin/sh", "-c", "printf '%s|' \"$@\" >\"$0\"", file, "a b", "", "*"}, {});
+  EXPECT_EQ(ContentOf(file), "a b||*|");
+}
+
+TEST(RunProgram, TellsTheSignal) {
+  Expect(Shell("kill -ABRT $$"), RunEnd::kKilled, SIGABRT);
+  Expect(Shell("kill -KILL $$"), RunEnd::kKilled, SIGKILL);
+}
+
+TEST(RunProgram, KillsWhatTakesTooLong) {
+  RunLimits limits;
+  limits.milliseconds = 200;
+  const auto start = std::chrono::steady_clock::now();
+  Expect(RunProgram({"/bin/sleep", "60"}, limits), RunEnd::kTimedOut, 0);
+  const auto taken = std::chrono::steady_clock::now() - start;
+  EXPECT_GE(taken, std::chrono::milliseconds(200));
+  EXPECT_LT(taken, std::chrono::seconds(5));
+  EXPECT_EQ(waitpid(-1, nullptr, WNOHANG), -1);  // it is gone
+}
+
+TEST(RunProgram, LeavesWhatEndsInTimeAlone) {
+  RunLimits limits;
+  limits.milliseconds = 20000;
+  Expect(RunProgram({"/bin/sleep", "0.3"}, limits), RunEnd::kExited, 0);
+}
+
+TEST(RunProgram, ThatIsNotThereIsNotStarted) {
+  Expect(RunProgram({"/nowhere/apktoolkit"}, {}), RunEnd::kNotStarted, 0);
+  Expect(RunProgram({"/dev/null"}, {}), RunEnd::kNotStarted, 0);
+}
+
+// What the standard streams of a shell are, before it redirects anything.
+std::string Streams() {
+  const TempDir folder;
+  const std::string file = folder / "output";
+  const char script[] =
+      "streams=$(readlink /proc/$$/fd/0 /proc/$$/fd/1 /proc/$$/fd/2); echo \"$streams\" >\"$0\"";
+  RunProgram({"/bin/sh", "-c", script, file}, {});
+  return ContentOf(file);
+}
+
+TEST(RunProgram, HasNullForItsStreamsAndNothingElseOpen) {
+  const int inherited = open("/dev/null", O_RDONLY);  // without O_CLOEXEC
+  EXPECT_EQ(Streams(), "/dev/null\n/dev/null\n/dev/null\n");
+  EXPECT_EQ(Printed("ls /proc/self/fd"), "0\n1\n2\n3\n");  // 3 is the listing's own
+  close(inherited);
+}
+
+// A daemon may have no streams of its own.
+TEST(RunProgram, HasItsStreamsThoughThisProcessHasNone) {
+  std::string streams;
+  {
+    const FreeDescriptor input(STDIN_FILENO), output(STDOUT_FILENO), errors(STDERR_FILENO);
+    streams = Streams();
+  }
+  EXPECT_EQ(streams, "/dev/null\n/dev/null\n/dev/null\n");
+}
+
+// A shell would unblock them itself.
+TEST(RunProgram, HasNoSignalBlocked) {
+  sigset_t some, before;
+  sigemptyset(&some);
+  sigaddset(&some, SIGTERM);
+  pthread_sigmask(SIG_BLOCK, &some, &before);
+  const TempDir folder;
+  const std::string file = folder / "status";
+  RunProgram({"/bin/cp", "/proc/self/status", file}, {});
+  pthread_sigmask(SIG_SETMASK, &before, nullptr);
+  EXPECT_NE(ContentOf(file).find("\nSigBlk:\t0000000000000000\n"), std::string::npos);
+}
+
+TEST(RunProgram, LimitsWrittenMemory) {
+  RunLimits limits;
+  limits.memory_bytes = size_t{64} << 20;
+  EXPECT_EQ(Printed("ulimit -d", limits), "65536\n");  // in KiB
+  limits.memory_bytes = 0;
+  EXPECT_EQ(Printed("ulimit -d", limits), Printed("ulimit -d", limits));
+  EXPECT_NE(Printed("ulimit -d", limits), "65536\n");
+}
+
+TEST(RunProgram, WithoutDescriptorsIsNotStarted) {
+  rlimit before = {};
+  getrlimit(RLIMIT_NOFILE, &before);
+  const rlimit none = {0, before.rlim_max};
+  setrlimit(RLIMIT_NOFILE, &none);
+  const RunResult run = RunProgram({"/bin/true"}, {});
+  setrlimit(RLIMIT_NOFILE, &before);
+  Expect(run, RunEnd::kNotStarted, EMFILE);
+}
+
+// Where SIGCHLD is ignored the kernel throws the status away.
+TEST(RunProgram, WhoseStatusSomebodyElseTookIsLost) {
+  const auto before = signal(SIGCHLD, SIG_IGN);
+  Expect(RunProgram({"/bin/true"}, {}), RunEnd::kLost, ECHILD);
+  signal(SIGCHLD, before);
+}
+
+}  // namespace

@@ -1,0 +1,228 @@
+// apktoolkit-verify as a process, in the simulated phone and without it.
+#include <fcntl.h>
+#include <gtest/gtest.h>
+#include <sys/socket.h>
+#include <sys/stat.h>
+#include <sys/un.h>
+#include <unistd.h>
+
+#include <csignal>
+#include <nlohmann/json.hpp>
+#include <sstream>
+
+#include "support/files.h"
+#include "support/namespaces.h"
+#include "support/package.h"
+#include "support/process.h"
+#include "support/simulation.h"
+
+namespace {
+
+using Words = std::vector<std::string>;
+
+ProcessResult Call(Words command, const Words& more, const std::string& directory = {}) {
+  command.insert(command.end(), more.begin(), more.end());
+  return RunProcess(command, directory);
+}
+
+// What the phone's kernel says, which these options of the simulator describe.
+ProcessResult Verify(const Words& words) { return Call({SimulatorPath(), "--verify"}, words); }
+
+// What the program says where there is no simulation.
+ProcessResult VerifyHere(const Words& words, const std::string& directory = {}) {
+  return Call({VerifyPath()}, words, directory);
+}
+
+void ExpectAnswer(const ProcessResult& run, int status, const std::string& output) {
+  EXPECT_EQ(run.output, output);
+  EXPECT_EQ(run.errors, "");
+  EXPECT_EQ(run.status, status);
+}
+
+// A good package with a library beside it, and a phone that remembers what the tool had signed.
+class SignedPackage : public testing::Test {
+ protected:
+  SignedPackage() {
+    PackageOptions options;
+    options.entries = {{"classes.dex", ToBytes("dex\n035")},
+                       {"lib/arm64-v8a/libfoo.so", ToBytes("\177ELF foo")}};
+    MakePackage(options).WriteTo(apk_);
+    EXPECT_EQ(Simulate(apk_, {"--state", state_}).status, 0);
+  }
+
+  TempDir folder_;
+  const std::string apk_ = folder_ / "base.apk";
+  const std::string library_ = folder_.Write("lib/arm64/libfoo.so", ToBytes("\177ELF foo"));
+  const std::string other_ = folder_.Write("lib/arm64/libbar.so", ToBytes("\177ELF bar"));
+  const std::string state_ = folder_ / "state";
+};
+
+TEST_F(SignedPackage, IsTrustedWithItsLibrary) {
+  ExpectAnswer(Verify({"--state", state_, apk_, library_}), 0,
+               apk_ + ": trusted\n" + library_ + ": trusted\n");
+}
+
+TEST_F(SignedPackage, IsTrustedAndWhatWasNotSignedIsNot) {
+  ExpectAnswer(Verify({"--state", state_, other_, apk_}), 1,
+               other_ + ": not trusted (errno 126, ENOKEY)\n" + apk_ + ": trusted\n");
+}
+
+TEST_F(SignedPackage, IsNoLongerTrustedWhenAByteChanges) {
+  folder_.Write("lib/arm64/libfoo.so", ToBytes("\177ELF fop"));
+  ExpectAnswer(Verify({"--state", state_, apk_, library_}), 1,
+               apk_ + ": trusted\n" + library_ + ": not trusted (errno 126, ENOKEY)\n");
+}
+
+// The phone that signed it is another one.
+TEST_F(SignedPackage, IsNotTrustedByAnotherPhone) {
+  ExpectAnswer(Verify({apk_}), 1, apk_ + ": not trusted (errno 126, ENOKEY)\n");
+}
+
+TEST(Verify, KernelGivesTheReason) {
+  const TempDir folder;
+  const std::string file = folder.Write("file", {});
+  ExpectAnswer(Verify({"--verify-errno", "EKEYREVOKED", file}), 1,
+               file + ": not trusted (errno 128, EKEYREVOKED)\n");
+  ExpectAnswer(Verify({"--verify-errno", "EKEYREVOKED", "--trust", file, file}), 0,
+               file + ": trusted\n");
+}
+
+// Asked once, and for nothing else: neither is the integrity value read nor anything signed.
+TEST(Verify, AsksForEachFileOnce) {
+  const TempDir folder;
+  const std::string file = folder.Write("file", {});
+  const ProcessResult run = Verify({"--json", "--trust", file, file});
+  std::istringstream lines(run.output);
+  std::vector<std::string> events;
+  for (std::string line; std::getline(lines, line);) {
+    events.push_back(nlohmann::json::parse(line).value("event", ""));
+  }
+  EXPECT_EQ(events, Words({"journal", "start", "attached", "verify", "stdout", "exit"}));
+  EXPECT_EQ(run.status, 0);
+}
+
+TEST(Verify, WhatCannotBeOpenedIsNotAsked) {
+  const TempDir folder;
+  const std::string missing = folder / "missing";
+  const std::string below = folder.Write("file", {}) + "/below";
+  ExpectAnswer(Verify({missing, below}), 1,
+               missing + ": cannot be opened (errno 2, ENOENT)\n" + below +
+                   ": cannot be opened (errno 20, ENOTDIR)\n");
+}
+
+TEST(Verify, WhatMayNotBeReadCannotBeOpened) {
+  if (!CanMakeNamespaces()) GTEST_SKIP() << kNoNamespaces;
+  const TempDir folder;
+  const std::string file = folder.Write("file", {});
+  ASSERT_EQ(chmod(file.c_str(), 0), 0);
+  ExpectAnswer(Call({"unshare", "-U", VerifyPath()}, {file}), 1,
+               file + ": cannot be opened (errno 13, EACCES)\n");
+}
+
+// A FIFO keeps nobody waiting, and whatever the kernel says of it or of a device counts for
+// nothing.
+TEST(Verify, WhatIsNoRegularFileIsNotTrusted) {
+  const TempDir folder;
+  const std::string fifo = folder / "fifo";
+  ASSERT_EQ(mkfifo(fifo.c_str(), 0600), 0);
+  ExpectAnswer(Verify({"--trust", fifo, "--trust", "/dev/null", fifo, "/dev/null", folder.path()}),
+               1,
+               fifo + ": not trusted (not a regular file)\n" +
+                   "/dev/null: not trusted (not a regular file)\n" + folder.path() +
+                   ": not trusted (not a regular file)\n");
+}
+
+TEST(Verify, SocketCannotBeOpened) {
+  const TempDir folder;
+  const std::string path = folder / "socket";
+  sockaddr_un address = {};
+  address.sun_family = AF_UNIX;
+  path.copy(address.sun_path, sizeof(address.sun_path) - 1);
+  const int fd = socket(AF_UNIX, SOCK_STREAM, 0);
+  ASSERT_EQ(bind(fd, reinterpret_cast<const sockaddr*>(&address), sizeof(address)), 0);
+  ExpectAnswer(VerifyHere({path}), 1, path + ": cannot be opened (errno 6, ENXIO)\n");
+  close(fd);
+}
+
+// Its holder would be waited for.
+TEST(Verify, FileThatIsLeasedCannotBeOpened) {
+  const TempDir folder;
+  const std::string path = folder.Write("file", {});
+  const int fd = open(path.c_str(), O_RDWR | O_CLOEXEC);
+  signal(SIGIO, SIG_IGN);  // how the holder is told
+  if (fcntl(fd, F_SETLEASE, F_WRLCK) != 0) GTEST_SKIP() << "the file system has no leases";
+  ExpectAnswer(VerifyHere({path}), 1, path + ": cannot be opened (errno 11, EAGAIN)\n");
+  close(fd);
+}
+
+TEST(Verify, LinkStandsForItsFile) {
+  const TempDir folder;
+  const std::string file = folder.Write("file", {});
+  const std::string link = folder / "link";
+  ASSERT_EQ(symlink("file", link.c_str()), 0);
+  ExpectAnswer(Verify({"--trust", file, link}), 0, link + ": trusted\n");
+}
+
+TEST(Verify, EachFileHasOneLineWhateverItsName) {
+  const TempDir folder;
+  folder.Write("a\nb: trusted\t\x7f\\\x1b[2J", {});
+  folder.Write("gr\xc3\xbcn \xff", {});
+  ExpectAnswer(VerifyHere({"a\nb: trusted\t\x7f\\\x1b[2J", "gr\xc3\xbcn \xff"}, folder.path()), 1,
+               "a\\x0ab: trusted\\x09\\x7f\\x5c\\x1b[2J: not trusted (errno 22, EINVAL)\n"
+               "gr\xc3\xbcn \xff: not trusted (errno 22, EINVAL)\n");
+}
+
+// EINVAL is what a kernel answers to a command of fcntl that it does not know.
+TEST(Verify, WithoutTheFeatureNothingIsTrusted) {
+  const TempDir folder;
+  const std::string file = folder.Write("file", {});
+  ExpectAnswer(VerifyHere({file}), 1, file + ": not trusted (errno 22, EINVAL)\n");
+}
+
+TEST(VerifyUsage, IsShownWithoutAFileAndForWhatLooksLikeAnOption) {
+  const std::string usage =
+      "usage: apktoolkit-verify FILE...\n(a file whose name begins with -: ./-NAME)\n";
+  for (const Words& words : {Words{}, {"--help"}, {"/dev/null", "-x"}, {"-"}}) {
+    const ProcessResult run = VerifyHere(words);
+    EXPECT_EQ(run.status, 2);
+    EXPECT_EQ(run.errors, usage);
+    EXPECT_EQ(run.output, "");
+  }
+  const TempDir folder;
+  folder.Write("-x", {});
+  EXPECT_EQ(VerifyHere({"./-x"}, folder.path()).output, "./-x: not trusted (errno 22, EINVAL)\n");
+}
+
+// "All are trusted" has to reach somebody.
+TEST(VerifyOutput, ThatCannotBeWrittenIsAFailure) {
+  const TempDir folder;
+  const std::string file = folder.Write("file", {});
+  const Words trusting = {SimulatorPath(), "--verify", "--trust", file, file};
+  for (const char* stream : {"exec \"$@\" >/dev/full", "exec \"$@\" >&-"}) {
+    EXPECT_EQ(Call({"sh", "-c", stream, "sh", VerifyPath()}, {file}).status, 2) << stream;
+    EXPECT_EQ(Call({"sh", "-c", stream, "sh"}, trusting).status, 3) << stream;
+  }
+}
+
+// ---- The simulator's part.
+
+TEST(SimulatorVerify, DoesNotGoWithWhatTellsOfSigning) {
+  for (const char* option : {"--install", "--strict", "--quiet", "--verbose", "--html=page"}) {
+    const ProcessResult run = Verify({option, "/dev/null"});
+    EXPECT_EQ(run.status, 2) << option;
+    EXPECT_NE(run.errors.find("excludes"), std::string::npos) << run.errors;
+  }
+}
+
+TEST(SimulatorVerify, ThatDoesNotEndIsNoAnswer) {
+  const TempDir folder;
+  const std::string program = folder.Write("slow", ToBytes("#!/bin/sh\nexec sleep 60\n"));
+  ASSERT_EQ(chmod(program.c_str(), 0700), 0);
+  const ProcessResult run = Verify({"--timeout", "0.3", "--tool", program, "/dev/null"});
+  EXPECT_EQ(run.output, "");
+  EXPECT_EQ(run.errors,
+            "apktoolkit-sim: /dev/null: it was still busy after 0.3 seconds and was stopped\n");
+  EXPECT_EQ(run.status, 3);
+}
+
+}  // namespace

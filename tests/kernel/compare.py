@@ -1,0 +1,196 @@
+#!/usr/bin/env python3
+"""compare.py FILES EXPECTED KERNEL...: holds what programs did on real kernels against what they did in
+the simulated phone, and prints a table.
+
+FILES has what they ran for, EXPECTED the simulator's journals, and each directory KERNEL `results`, as
+tests/kernel/init left them, and `disk.img`. Fails when anything differs: an event (log record, reading
+of the integrity value, what the kernel was asked with payload, result and errno, registration, exit
+status), its place among the others, a line of output; or when a signed file on the disk does not hold
+its payload, or the kernel complained.
+"""
+
+import difflib
+import hashlib
+import json
+import pathlib
+import re
+import subprocess
+import sys
+import tempfile
+
+import runs
+
+PRIORITIES = {"V": 2, "D": 3, "I": 4, "W": 5, "E": 6, "F": 7}
+# How the workstation's liblog begins a record on standard error: tag, priority, date, time, two numbers.
+RECORD = re.compile(r"(\S+) ([VDIWEF]) \d\d-\d\d \d\d:\d\d:\d\d +\d+ +\d+ (.*)", re.S)
+# What only the simulator has to say; output is held apart, as it comes when the program ends.
+OF_SIMULATION = {"journal", "start", "attached", "verdict", "stdout"}
+SEEN_BY_MODULE = {"integrity", "sign", "verify"}
+INFORMATION = 4  # the workstation's liblog keeps records of a lower priority to itself
+COMPLAINT = re.compile(r"BUG:|WARNING:|Oops|Call [Tt]race|refcount_t|general protection|avc: +denied")
+# How a kernel with a policy tells that the installer's domain started a program of the tool's.
+ENTRY = re.compile(r"avc: +granted +{ transition } .* scontext=u:r:installd:s0 tcontext=u:r:apktoolkit:s0 ")
+
+
+class Kernel:
+    """What came from a kernel."""
+
+    def __init__(self, directory):
+        self.name = directory.name
+        self.results = directory / "results"
+        self.disk = directory / "disk.img"
+        lines = (self.results / "facts").read_text().splitlines()
+        self.facts = dict(line.split(" ", 1) for line in lines)
+        self.messages = (self.results / "dmesg").read_text(errors="replace").splitlines()
+        self.problems = [f"the kernel complains: {line}" for line in self.messages if COMPLAINT.search(line)]
+        self.has_policy = (directory / "root/policy").exists()
+        self.verdicts = {}  # "same" or "DIFFERS", by the name of the run
+
+    def events(self, run):
+        """All but output: the events, with the log's records where they stand among them."""
+        events = []
+        for line in (self.results / f"{run.name}.journal").read_text().split("\n")[:-1]:
+            record = RECORD.fullmatch(line)
+            if line.startswith('{"event":'):
+                events.append(json.loads(line))
+            elif record:
+                events.append({"event": "log", "priority": PRIORITIES[record[2]], "tag": record[1],
+                               "text": record[3]})
+            elif events and events[-1]["event"] == "log":
+                # The record ends in a line end of its own, or goes on after it.
+                events[-1]["text"] += "\n" + line
+            else:
+                events.append({"event": "unknown", "text": line})
+        return events
+
+    def output(self, run):
+        return (self.results / f"{run.name}.output").read_text()
+
+
+def simulated(expected, run):
+    """The events of the simulated phone but output, and the output."""
+    lines = (expected / f"{run.name}.journal").read_text().splitlines()
+    events = [json.loads(line) for line in lines]
+    output = "".join(event["text"] for event in events if event["event"] == "stdout")
+    unseen = OF_SIMULATION | (set() if run.feature else SEEN_BY_MODULE)
+    return [event for event in events
+            if event["event"] not in unseen and event.get("priority", INFORMATION) >= INFORMATION], output
+
+
+def as_lines(events, output):
+    return [json.dumps(event) for event in events] + [f"output: {line}" for line in output.splitlines()]
+
+
+def compare(kernel, expected, run):
+    wanted = as_lines(*simulated(expected, run))
+    found = as_lines(kernel.events(run), kernel.output(run))
+    kernel.verdicts[run.name] = "same" if found == wanted else "DIFFERS"
+    if found != wanted:
+        kernel.problems += [f"{run.name}:", *difflib.unified_diff(wanted, found, "simulated", kernel.name,
+                                                                 lineterm="")]
+
+
+def probe_answers(kernel, files, run):
+    """What the calls of the probe returned, with errno."""
+    wanted = (files / f"{run.file}.out").read_text().splitlines()
+    found = (kernel.results / f"{run.name}.out").read_text().splitlines()
+    if found != wanted:
+        kernel.verdicts[run.name] = "DIFFERS"
+        kernel.problems += [f"{run.name}:", *difflib.unified_diff(wanted, found, "simulated", kernel.name,
+                                                                 lineterm="")]
+
+
+def last_payloads(kernel, all_runs):
+    """The payload with which each file was signed last, by its path."""
+    return {event["path"]: bytes.fromhex(event["payload"])
+            for run in all_runs for event in kernel.events(run)
+            if event["event"] == "sign" and event["result"] == 0}
+
+
+def check_disk(kernel, files, all_runs):
+    """Each signed file keeps the digest of its bytes and its payload, as e2fsprogs read the disk."""
+    payloads = last_payloads(kernel, all_runs)
+    with tempfile.TemporaryDirectory() as name:
+        folder = pathlib.Path(name)
+        commands = []
+        for number, path in enumerate(payloads):
+            inside = "/" + str(pathlib.Path(path).relative_to(files))
+            commands += [f"dump {inside} {folder}/{number}.bytes",
+                         f"ea_get -f {folder}/{number}.kept {inside} security.integrity_stand_in"]
+        (folder / "commands").write_text("\n".join(commands) + "\n")
+        subprocess.run(["debugfs", "-f", folder / "commands", kernel.disk], check=True,
+                       stdout=subprocess.DEVNULL, stderr=subprocess.DEVNULL)
+        for number, (path, payload) in enumerate(payloads.items()):
+            digest = hashlib.sha256((folder / f"{number}.bytes").read_bytes()).digest()
+            kept = folder / f"{number}.kept"
+            is_changed = path.endswith("/changed.jar")
+            if not kept.exists() or kept.read_bytes()[32:] != payload:
+                kernel.problems.append(f"{path} does not keep its payload on the disk")
+            elif (kept.read_bytes()[:32] == digest) == is_changed:
+                kernel.problems.append(f"{path} keeps the digest of other bytes")
+    return len(payloads)
+
+
+def check_domain(kernel, all_runs):
+    """With a policy each run that is confined was one in the tool's domain."""
+    entered = sum(bool(ENTRY.search(line)) for line in kernel.messages)
+    confined = sum(run.confined for run in all_runs)
+    if kernel.has_policy and entered != confined:
+        kernel.problems.append(f"the tool's domain was entered {entered} times in {confined} confined runs")
+
+
+def summary(expected, run):
+    """What was asked of the phone, in few words."""
+    events, _ = simulated(expected, run)
+    answers = {}
+    for event in events:
+        if event["event"] in ("sign", "verify"):
+            answer = {"sign": "signed", "verify": "trusted"}[event["event"]]
+            if event["result"] != 0:
+                answer = f"{event['event']}: {runs.error_name(event['errno'])}"
+        elif event["event"] == "register":
+            answer = "registered"
+        else:
+            continue
+        answers[answer] = answers.get(answer, 0) + 1
+    return ", ".join(f"{count} {answer}" for answer, count in answers.items()) or "nothing is asked"
+
+
+def print_table(kernels, expected, all_runs):
+    rows = [["", "what the phone did"] + [kernel.facts["release"] for kernel in kernels]]
+    rows += [["", ""] + [f"{k.facts['machine']}, {k.facts['page']} pages" for k in kernels]]
+    rows += [["", ""] + ["SELinux enforcing" if k.has_policy else "" for k in kernels]]
+    rows += [["", "seconds to boot, and to run"] +
+             [f"{float(k.facts['booted']):.0f} + {float(k.facts['ended']) - float(k.facts['booted']):.0f}"
+              for k in kernels]]
+    rows += [[run.name, summary(expected, run)] + [k.verdicts[run.name] for k in kernels]
+             for run in all_runs]
+    widths = [max(len(row[column]) for row in rows) for column in range(len(rows[0]))]
+    for row in rows:
+        print("  ".join(cell.ljust(width) for cell, width in zip(row, widths)).rstrip())
+
+
+def main():
+    files, expected, *directories = [pathlib.Path(word).resolve() for word in sys.argv[1:]]
+    all_runs = runs.all_runs(runs.golden_names(files))
+    kernels = [Kernel(directory) for directory in directories]
+    kept = 0
+    for kernel in kernels:
+        for run in all_runs:
+            compare(kernel, expected, run)
+            if run.program == runs.PROBE:
+                probe_answers(kernel, files, run)
+        kept += check_disk(kernel, files, all_runs)
+        check_domain(kernel, all_runs)
+    print_table(kernels, expected, all_runs)
+    problems = [f"{kernel.name}: {problem}" for kernel in kernels for problem in kernel.problems]
+    if problems:
+        print(f"FAILED: {len(all_runs)} runs on {len(kernels)} kernels", *problems, sep="\n")
+        return 1
+    print(f"{len(all_runs)} runs on {len(kernels)} kernels: all results and payloads are the simulator's, "
+          f"and {kept} signed files keep theirs on the disk")
+    return 0
+
+
+if __name__ == "__main__":
+    sys.exit(main())

@@ -1,0 +1,22 @@
+#include "verify/error_name.h"
+
+#include <gtest/gtest.h>
+
+#include <climits>
+#include <cstring>
+
+// The C library names every number up to the highest that a system call can answer.
+TEST(ErrorName, IsTheNameThatTheCLibraryHas) {
+  constexpr int kLast = 4095;
+  int named = 0;
+  for (int error = 1; error <= kLast; ++error) {
+    const char* const known = strerrorname_np(error);
+    EXPECT_EQ(ErrorName(error), known == nullptr ? "-" : known) << error;
+    if (known != nullptr) ++named;
+  }
+  EXPECT_EQ(named, 131);  // in include/uapi/asm-generic of Linux: 1 to 133 without 41 and 58
+}
+
+TEST(ErrorName, OfWhatIsNoErrorIsADash) {
+  for (const int error : {0, -1, -126, INT_MIN, INT_MAX}) EXPECT_EQ(ErrorName(error), "-") << error;
+}

@@ -1,0 +1,101 @@
+// apktoolkit-verify: asks the kernel of each file whether it trusts it, and prints a line a file.
+// Nothing is read of the file, nothing is logged, and the answer is the kernel's alone. The exit
+// status: 0 all are trusted, 1 one is not or cannot be opened, 2 the command line is wrong or the
+// output could not be written.
+#include <fcntl.h>
+#include <sys/stat.h>
+#include <unistd.h>
+
+#include <cerrno>
+#include <cstdio>
+
+#include "sign/integrity.h"
+#include "verify/error_name.h"
+
+namespace {
+
+constexpr int kAllTrusted = 0;
+constexpr int kNotTrusted = 1;
+constexpr int kUsageError = 2;
+
+bool IsCommandLineRight(int argc, char* argv[]);
+bool IsTrusted(const char* path);
+bool AskKernel(int fd);
+void PrintPath(const char* path);
+void PrintError(const char* fact, int error);
+
+}  // namespace
+
+int main(int argc, char* argv[]) {
+  if (!IsCommandLineRight(argc, argv)) {
+    fputs("usage: apktoolkit-verify FILE...\n(a file whose name begins with -: ./-NAME)\n", stderr);
+    return kUsageError;
+  }
+  int status = kAllTrusted;
+  for (int i = 1; i < argc; ++i) {
+    if (!IsTrusted(argv[i])) status = kNotTrusted;
+  }
+  const bool is_written = fflush(stdout) == 0 && ferror(stdout) == 0;
+  return is_written ? status : kUsageError;
+}
+
+namespace {
+
+// At least one file; there are no options, and none may pass for a file.
+bool IsCommandLineRight(int argc, char* argv[]) {
+  for (int i = 1; i < argc; ++i) {
+    if (argv[i][0] == '-') return false;
+  }
+  return argc > 1;
+}
+
+// Opens the file without waiting, should it be a FIFO or be leased.
+bool IsTrusted(const char* path) {
+  PrintPath(path);
+  const int fd = open(path, O_RDONLY | O_NONBLOCK | O_NOCTTY | O_CLOEXEC);
+  if (fd < 0) {
+    PrintError("cannot be opened", errno);
+    return false;
+  }
+  const bool is_trusted = AskKernel(fd);
+  close(fd);
+  return is_trusted;
+}
+
+// The kernel fixes the bytes of regular files; what it says of others means nothing, so it is not
+// asked.
+bool AskKernel(int fd) {
+  struct stat state = {};
+  if (fstat(fd, &state) != 0 || !S_ISREG(state.st_mode)) {
+    puts("not trusted (not a regular file)");
+    return false;
+  }
+  if (VeltVerifyFd(fd) != 0) {
+    PrintError("not trusted", errno);
+    return false;
+  }
+  puts("trusted");
+  return true;
+}
+
+// A path may hold anything but NUL. What would end the line, or a terminal would obey, is printed
+// as \xHH, and so is the backslash.
+void PrintPath(const char* path) {
+  for (; *path != '\0'; ++path) {
+    const auto byte = static_cast<unsigned char>(*path);
+    const bool is_plain = byte >= 0x20 && byte != 0x7f && byte != '\\';
+    if (is_plain) {
+      putchar(byte);
+    } else {
+      printf("\\x%02x", static_cast<unsigned>(byte));
+    }
+  }
+  fputs(": ", stdout);
+}
+
+void PrintError(const char* fact, int error) {
+  const std::string_view name = ErrorName(error);
+  printf("%s (errno %d, %.*s)\n", fact, error, static_cast<int>(name.size()), name.data());
+}
+
+}  // namespace
