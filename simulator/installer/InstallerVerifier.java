@@ -12,10 +12,12 @@ import com.android.apksig.util.DataSource;
 import com.android.apksig.util.DataSources;
 import java.io.BufferedReader;
 import java.io.File;
+import java.io.IOException;
 import java.io.InputStreamReader;
 import java.io.OutputStream;
 import java.io.PrintStream;
 import java.io.RandomAccessFile;
+import java.nio.BufferOverflowException;
 import java.nio.charset.StandardCharsets;
 import java.security.cert.X509Certificate;
 import java.util.ArrayList;
@@ -143,11 +145,26 @@ public final class InstallerVerifier {
             }
         } catch (ApkFormatException exception) {
             malformed.add(issue("MALFORMED_APK", new Object[0], exception.getMessage()));
+        } catch (IOException exception) {
+            if (!isOfDamagedData(exception)) {
+                throw exception;
+            }
+            malformed.add(issue("MALFORMED_APK", new Object[0], exception.getMessage()));
         }
         range.said = members("schemes", list(schemes), "signers", list(signers),
                 "errors", malformed.isEmpty() ? list(issues(errors)) : list(malformed),
                 "warnings", list(issues(warnings)));
         return range;
+    }
+
+    // Whether the file could be read, and an entry's data are longer than the entry says.
+    private static boolean isOfDamagedData(Throwable failure) {
+        for (Throwable cause = failure; cause != null; cause = cause.getCause()) {
+            if (cause instanceof BufferOverflowException) {
+                return true;
+            }
+        }
+        return false;
     }
 
     // What the result says of one scheme. Older generations of apksig do not know all schemes, so

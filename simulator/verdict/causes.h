@@ -404,9 +404,9 @@ inline constexpr Cause kEntriesMissing = {"entries-missing", Group::kWarning, Se
     "Sign the package again, as the last step that changes it. If it is not of your making: do not "
     "trust it."};
 inline constexpr Cause kEntriesNotCompared = {"entries-not-compared", Group::kWarning,
-    Severity::kAlarm, ChainLink::kNone, "", "%s not compared with the manifest: too long, of "
-    "another digest than SHA-1 and SHA-256, or the time was up",
-    "Run it again with a larger --timeout. Entries above 512 MiB are not compared."};
+    Severity::kAlarm, ChainLink::kNone, "", "%s not compared with the manifest: unreadable, too "
+    "long, of another digest than SHA-1 and SHA-256, or the time was up",
+    "unzip -t names an unreadable entry. Run it again with a larger --timeout. Entries above 512 MiB are not compared."};
 inline constexpr Cause kWeakKey = {"weak-key", Group::kWarning, Severity::kWarning,
     ChainLink::kNone, "", "its RSA key has %s bits, and 2048 are the least that is safe",
     "Sign a new app with a key of 2048 bits or more. For a published one that is another signer."};

@@ -108,6 +108,30 @@ TEST(Entries, LibraryChangedInsideThePackageIsNotBlamedOnTheInstallation) {
   EXPECT_EQ(event["entries"]["differing"]["looked_at"], 1);
 }
 
+// A fault of the package, and not one that the verifier does not survive. The length of an entry is
+// in its local header, and in the record of the central directory.
+TEST(Installer, RefusesAnEntryThatIsLongerThanItSays) {
+  const TempDir folder;
+  const ProcessResult made = RunProcess({"bash", "-e", "-c", R"(cp -r "$0"/* .
+python3 -c '
+import struct, zipfile
+name = "META-INF/CERT.SF"
+at = zipfile.ZipFile("base.apk").getinfo(name).header_offset
+data = bytearray(open("base.apk", "rb").read())
+for field in (at + 22, data.rindex(name.encode()) - 46 + 24):
+    struct.pack_into("<I", data, field, 10)
+open("base.apk", "wb").write(data)')",
+                                         Golden("v1-alone")},
+                                        folder.path());
+  ASSERT_EQ(made.status, 0) << made.errors;
+  const ProcessResult run = RunProcess({SimulatorPath(), "base.apk"}, folder.path());
+  EXPECT_EQ(run.status, 1);
+  EXPECT_NE(run.output.find("phones do not install it: Failed to read data of compressed entry "
+                            "META-INF/CERT.SF (MALFORMED_APK)\n"),
+            std::string::npos)
+      << run.output << run.errors;
+}
+
 // Phones of API 27 go by v2, newer ones by v3.
 TEST(Installer, RefusesWhatWasChangedUnderANewerSignature) {
   for (const char* name : {"commented", "changed-inside-v2"}) {
