@@ -27,7 +27,7 @@ const VerdictWords& WordsOf(Verdict verdict);
 // Such as "3 files: 1 signed, 2 refused".
 std::string Summary(const std::vector<Verdict>& verdicts);
 
-// What stands in the line of the verdict behind the file: the package's name, the signer and his
+// The line of the verdict has these behind the file: the package's name, the signer and his
 // key, and the warnings that are alarms. `ellipsis` stands in the midst of a digest.
 std::vector<std::string> HeadFacts(const Report& report, const char* ellipsis);
 
