@@ -48,7 +48,7 @@ std::string JarSigner(const char* file) {
   return digits;
 }
 
-// Whether `wanted` is one of the words between the commas.
+// True if `wanted` is one of the words between the commas.
 bool IsAmong(std::string_view words, std::string_view wanted) {
   while (true) {
     const size_t comma = words.find(',');

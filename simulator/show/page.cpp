@@ -97,7 +97,7 @@ data FileFields(const Report& report, size_t number) {
   return file;
 }
 
-// What is long is cut before it is put together, so that the key stands behind a name of any
+// Each long part is cut before the parts are put together. The key stands behind a name of any
 // length.
 list HeadLines(const Report& report) {
   Report head;
