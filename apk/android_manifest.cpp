@@ -119,12 +119,12 @@ Text getStrAttr(const ResXMLParser& parser, std::string_view name) {
 bool Equals(Text text, std::string_view wanted) {
   constexpr size_t kMostSurrogates = 16;
   if (text.size() < wanted.size() || text.size() > wanted.size() + kMostSurrogates) return false;
-  size_t found = 0;
   for (; !text.empty(); text.remove_prefix(1)) {
     if (IsUnpairedSurrogate(text)) continue;
-    if (found == wanted.size() || FirstUnit(text) != wanted[found++]) return false;
+    if (wanted.empty() || FirstUnit(text) != wanted.front()) return false;
+    wanted.remove_prefix(1);
   }
-  return found == wanted.size();
+  return wanted.empty();
 }
 
 // Tells of the first unit of a text that does not begin in the middle of a pair.

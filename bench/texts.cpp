@@ -79,7 +79,7 @@ constexpr Text kTexts[] = {
     {"one name without end", [] { return Repeat([](size_t) { return "A"; }); }},
 };
 
-// What deflates to a thousandth.
+// Numbers that deflate to a thousandth.
 constexpr size_t kManyNodes = 1 << 20;
 constexpr size_t kLongName = 30000;
 
@@ -132,7 +132,7 @@ long PeakKilobytes() {
   return 0;
 }
 
-// What it took to make the text does not count.
+// The memory that making the text took does not count.
 void ResetPeak() { std::ofstream("/proc/self/clear_refs") << "5"; }
 
 void Measure(const Reader& reader, const Text& text) {

@@ -23,7 +23,7 @@ bool IsPartOf(std::string_view part, std::string_view whole) {
          (part.data() >= whole.data() && part.data() + part.size() <= whole.data() + whole.size());
 }
 
-// Whatever it is, there are digests of what was read, and none of what was not.
+// A certificate that was read has digests; one that was not has none.
 void JudgeCertificate(std::string_view bytes) {
   const auto facts = ParseCertificate(bytes);
   ParseAlgorithm(bytes);

@@ -1,6 +1,5 @@
-// What the simulator reads of a journal, which holds names and texts that a package influences: its
-// texts and their way back, one line of the tool's log, and all of a run. The first byte says
-// which.
+// A package influences names and texts of a journal. This reads them as the simulator does: texts
+// and their way back, one line of the tool's log, or a whole run. The first byte says which.
 #include <algorithm>
 #include <sstream>
 #include <string>

@@ -203,7 +203,7 @@ void JudgeVerdict(const Run& run, const PackageFacts& facts, const Report& repor
   Require(!is_good || !facts.was_changed || HasWarning(report, cause::kFileChanged), "a change");
 }
 
-// What stands in the line of the verdict: the key, and what belies it.
+// The line of the verdict names the right key, and the warnings against it.
 void JudgeShown(const Report& report) {
   std::ostringstream line, all;
   PrintReport(report, Detail::kVerdict, Look(), line);

@@ -7,15 +7,20 @@
 #include <string>
 #include <vector>
 
+// In bytes. A build may set another, as one with AddressSanitizer must, whose programs need more.
+#ifndef APKTOOLKIT_MEMORY_LIMIT
+#define APKTOOLKIT_MEMORY_LIMIT (size_t{1} << 30)
+#endif
+
 struct RunLimits {
   // Until the program is killed. A package of 100 MB takes a phone some seconds; a kernel whose
   // integrity value does not settle keeps the tool waiting for ever.
   int milliseconds = 120000;
-  // What the program may write to in memory (RLIMIT_DATA); 0: as much as this process. The tool
+  // The memory that the program may write to (RLIMIT_DATA); 0: as much as this process. The tool
   // needs up to 16 bytes for each byte of the file and of what its entries hold, and ends where
   // there are no more. Not RLIMIT_AS: allocators of newer releases reserve far more addresses than
   // they use.
-  size_t memory_bytes = size_t{1} << 30;
+  size_t memory_bytes = APKTOOLKIT_MEMORY_LIMIT;
 };
 
 enum class RunEnd {

@@ -48,7 +48,7 @@ SignOutcome SignPackage(const std::string& directory, const InstalledPackage& pa
   const RunResult run = RunProgram({directory + "/apktoolkit-bound", package.signer_digests,
                                     directory + "/apktoolkit", package.path},
                                    limits);
-  // Whatever came of the run: the exit status of the tool tells nothing, the kernel does.
+  // The exit status of the tool tells nothing about the file. The kernel does.
   if (IsTrusted(directory, package.path, limits)) return SignOutcome::kTrusted;
   return WhyNotTrusted(run);
 }

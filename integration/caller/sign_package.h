@@ -32,9 +32,9 @@ enum class SignOutcome {
 // Runs the programs apktoolkit-verify, apktoolkit-bound and apktoolkit in `directory`
 // ("/system/bin").
 //
-// What to do with the outcome is the product's decision, and the same as for any package that has
-// no payload. After kTimedOut and kOutOfMemory its libraries may be signed and itself is not, since
-// it comes last. Do not try again at once: the same file takes the same time.
+// The product decides what to do with the outcome. It treats an untrusted package like any other
+// that has no payload. After kTimedOut and kOutOfMemory its libraries may be signed and itself is
+// not, since it comes last. Do not try again at once: the same file takes the same time.
 SignOutcome SignPackage(const std::string& directory, const InstalledPackage& package,
                         const RunLimits& limits);
 

@@ -1,6 +1,6 @@
 /* SPDX-License-Identifier: GPL-2.0-only OR Apache-2.0 */
 /*
- * What the module was asked and what it answered: lines of the journal that docs/journal.md
+ * Each question to the module and its answer: lines of the journal that docs/journal.md
  * describes, in the file that the parameter `journal` names. Without one nothing is written.
  */
 #include <linux/types.h>

@@ -19,6 +19,7 @@
 
 #include "apk/apk.h"
 #include "util/digest.h"
+#include "util/file.h"
 #include "util/scoped_fd.h"
 
 namespace {
@@ -32,7 +33,7 @@ constexpr int kNotStarted = 5;
 // The digest of the key whose signatures over the signature file and over its own certificate hold,
 // or nothing where there is none. The tool makes its payload of the same.
 std::string JarSigner(const char* file) {
-  const ScopedFd fd(open(file, O_RDONLY | O_NONBLOCK | O_CLOEXEC));
+  const ScopedFd fd(OpenForReading(file, O_CLOEXEC));
   if (fd.get() < 0) return {};
   const ApkTools::Apk apk(fd.get());
   if (!apk.IsApk() || apk.GetManufacturerKey().empty()) return {};
@@ -47,7 +48,7 @@ std::string JarSigner(const char* file) {
   return digits;
 }
 
-// Whether `wanted` is one of the words between the commas.
+// True if `wanted` is one of the words between the commas.
 bool IsAmong(std::string_view words, std::string_view wanted) {
   while (true) {
     const size_t comma = words.find(',');

@@ -1,4 +1,4 @@
-// What the simulator asks the platform's resource library directly. Two generations of it are in
+// Questions of the simulator to the platform's resource library. Two generations of it are in
 // use: the later one gives texts as views. Only this file sees the difference.
 #pragma once
 

@@ -38,7 +38,8 @@ STAND_IN FILE* fopen(const char* path, const char* mode) {
   return pid ? OpenIntegrity(*pid, mode) : next(path, mode);
 }
 
-// What fopen is in programs that are built for large files: one function on a 64-bit system.
+// Programs that are built for large files call fopen by this name. It is one function on a 64-bit
+// system.
 STAND_IN FILE* fopen64(const char* path, const char* mode) __attribute__((alias("fopen")));
 
 namespace {

@@ -34,8 +34,8 @@ bool IsNameForInstallers(const std::string& entry);
 bool Wants(InstalledAbi choice, bool is_arm64, bool has_arm64);
 bool PutPackage(const std::string& file, int source, const std::string& copy,
                 const Deadline& deadline);
-bool Extract(const Archive& archive, const std::string& entry, const std::string& path,
-             const Deadline& deadline);
+int Extract(const Archive& archive, const std::string& entry, const std::string& path,
+            const Deadline& deadline);
 bool WriteAll(int fd, std::string_view bytes, const Deadline& deadline);
 
 }  // namespace
@@ -63,18 +63,20 @@ std::optional<std::string> Installation::LayOut(const std::string& file, Install
 
   std::string directory = fs::temp_directory_path(error).string() + "/apktoolkit-sim.XXXXXX";
   if (error) return error.message();
-  const auto failure = [](const std::string& path) { return path + ": " + strerrordesc_np(errno); };
-  if (mkdtemp(directory.data()) == nullptr) return failure(directory);
+  const auto failure = [](const std::string& path, int number) {
+    return path + ": " + strerrordesc_np(number);
+  };
+  if (mkdtemp(directory.data()) == nullptr) return failure(directory, errno);
   directory_ = fs::canonical(directory, error).string();
   // Whatever the file is called: a library's directory has another name.
   const std::string copy = directory_ + "/base.apk";
-  if (!PutPackage(file, source.get(), copy, deadline)) return failure(copy);
+  if (!PutPackage(file, source.get(), copy, deadline)) return failure(copy, errno);
   for (const auto& [place, entry] : layout) {
     const std::string path = directory_ + "/" + place;
     fs::create_directories(fs::path(path).parent_path(), error);
-    errno = 0;
-    if (Extract(archive, entry, path, deadline)) continue;
-    if (errno != 0) return failure(path);
+    const int extracted = Extract(archive, entry, path, deadline);
+    if (extracted == 0) continue;
+    if (extracted > 0) return failure(path, extracted);
     not_extracted_.push_back(entry);
     unlink(path.c_str());
   }
@@ -149,20 +151,20 @@ bool PutPackage(const std::string& file, int source, const std::string& copy,
   return size == 0;
 }
 
-// False with errno 0 when it is the entry that cannot be extracted.
-bool Extract(const Archive& archive, const std::string& entry, const std::string& path,
-             const Deadline& deadline) {
+// Returns 0, the errno of the new file, or -1 when it is the entry that cannot be extracted.
+int Extract(const Archive& archive, const std::string& entry, const std::string& path,
+            const Deadline& deadline) {
   constexpr mode_t kMode = 0755;
   const int flags = O_WRONLY | O_CREAT | O_EXCL | O_NOFOLLOW | O_CLOEXEC;
   const ScopedFd file(open(path.c_str(), flags, kMode));
-  if (file.get() < 0) return false;
+  if (file.get() < 0) return errno;
   int error = 0;
   const bool is_whole = archive.Stream(entry, [&](std::string_view part) {
     if (!WriteAll(file.get(), part, deadline)) error = errno;
     return error == 0;
   });
-  errno = error;
-  return is_whole;
+  if (error != 0) return error;
+  return is_whole ? 0 : -1;
 }
 
 bool WriteAll(int fd, std::string_view bytes, const Deadline& deadline) {

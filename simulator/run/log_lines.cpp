@@ -79,7 +79,7 @@ Pattern MakePattern(const LogText& row);
 LogLine ReadLogLine(const std::string& text) {
   LogLine line;
   line.whole = text.substr(0, text.size() - (!text.empty() && text.back() == '\n' ? 1 : 0));
-  // What is this long was cut, and is known by its start alone.
+  // A line of this length was cut, and is known by its start alone.
   const bool is_cut = text.size() + 1 >= kLogTextSize;
   for (const Pattern& pattern : Patterns()) {
     const std::string& start = pattern.start;

@@ -1,5 +1,4 @@
-// What this process was started with, how it is asked to end, and when a file has kept it busy for
-// too long.
+// This process: its standard streams, its interruption by a signal, and the time limit for a file.
 #pragma once
 
 #include <chrono>

@@ -108,7 +108,7 @@ std::string HeadText(const Report& report) {
   return text;
 }
 
-// What is long is cut before it is put together, so that the key stands behind a name of any
+// Each long part is cut before the parts are put together. The key stands behind a name of any
 // length.
 list HeadLines(const Report& report) {
   Report head;

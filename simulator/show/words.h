@@ -38,8 +38,8 @@ std::vector<std::string> AlarmFacts(const Report& report);
 // refused.
 std::string DecisiveReason(const Report& report);
 
-// What stands in the line of the verdict behind the file: the decisive reason, or else whose
-// package it is; then the alarms, and how many warnings there are in all.
+// The line of the verdict has these behind the file: the decisive reason, or else whose package it
+// is; then the alarms, and the number of all warnings.
 std::vector<std::string> HeadFacts(const Report& report, const char* ellipsis);
 
 // What stands before a line.

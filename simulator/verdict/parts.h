@@ -36,9 +36,8 @@ void AddInstallerItem(const Judgement& judgement, const JudgeOptions& options,
 // Whether the key is the JAR signer's, as the kernel gets it and as the certificate shows it.
 bool IsJarSigner(const PublicKey& key, const Report& report);
 
-// What is worth knowing of a file although it changes nothing for the kernel. Of the report the
-// items, the signers and the key are filled. What the file's own item says already is not said
-// twice.
+// Facts that matter to the user although they change nothing for the kernel. Of the report the
+// items, the signers and the key are filled. A fact of the file's own item is not told twice.
 std::vector<Reason> FindWarnings(const RunRecord& run, const PackageFacts& facts,
                                  const Report& report);
 

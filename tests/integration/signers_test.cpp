@@ -5,6 +5,7 @@
 #include <filesystem>
 
 #include "support/files.h"
+#include "support/lease.h"
 #include "support/package.h"
 #include "support/process.h"
 #include "support/signing_block.h"
@@ -127,6 +128,17 @@ TEST(Signers, RetiredKeyIsNoSigner) {
   EXPECT_EQ(SignersOf(apk, 33), DigestOfKey("openssl-cms-issued"));
   ExpectNotRun(kOtherSigner, SignersOf(apk, 33), apk);
   ExpectRun(SignersOf(apk, 27), apk);
+}
+
+// As the tool does it: the signer of a leased package is looked at once the holder gives it up.
+TEST(Signers, OfALeasedPackageAreWaitedFor) {
+  const TempDir folder;
+  const std::string apk = folder / "base.apk";
+  fs::copy_file(Golden("apksigner-sha256-2048/base.apk"), apk);
+  const Lease lease(apk);
+  if (!lease.IsHeld()) GTEST_SKIP() << "the file system of " << apk << " knows no leases";
+  ExpectRun(DigestOfKey("apksigner-sha256-2048"), apk);
+  EXPECT_TRUE(lease.WasGivenUp());
 }
 
 TEST(Signers, ThatAreNotRsaHaveNoDigest) {

@@ -214,15 +214,4 @@ TEST(SimulatorVerify, DoesNotGoWithWhatTellsOfSigning) {
   }
 }
 
-TEST(SimulatorVerify, ThatDoesNotEndIsNoAnswer) {
-  const TempDir folder;
-  const std::string program = folder.Write("slow", ToBytes("#!/bin/sh\nexec sleep 60\n"));
-  ASSERT_EQ(chmod(program.c_str(), 0700), 0);
-  const ProcessResult run = Verify({"--timeout", "0.3", "--tool", program, "/dev/null"});
-  EXPECT_EQ(run.output, "");
-  EXPECT_EQ(run.errors,
-            "apktoolkit-sim: /dev/null: it was still busy after 0.3 seconds and was stopped\n");
-  EXPECT_EQ(run.status, 3);
-}
-
 }  // namespace

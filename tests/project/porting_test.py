@@ -32,7 +32,7 @@ def interface_problems():
     wanted.append(f"every {milliseconds} ms")
     success = re.search(r"result == (0x\w+)", libzu)[1]
     wanted.append(f"{int(success, 16)} ({success})")
-    declaration = re.search(r'extern "C" (int ZuNewCertificate\([^)]*\);)', libzu)[1]
+    declaration = re.search(r'(extern "C" int ZuNewCertificate\([^)]*\);)', libzu)[1]
     wanted.append(f"\n    {declaration}\n")
     return [f"docs/porting.md does not say {text!r}" for text in wanted if text not in PAGE]
 

@@ -73,6 +73,15 @@ TEST(ExitStatus, ThreeWhenTheToolDoesNotEnd) {
       "apktoolkit-sim: " + probe.path() + ": it was still busy after 1 second and was stopped\n");
 }
 
+TEST(ExitStatus, ThreeWhenTheVerifierDoesNotEnd) {
+  const Probe probe({"sleep 60"});
+  const ProcessResult result = Simulated({"--verify", "--timeout", "1", probe.path()});
+  EXPECT_EQ(result.output, "");
+  EXPECT_EQ(result.errors, "apktoolkit-sim: " + probe.path() +
+                               ": it was still busy after 1 second and was stopped\n");
+  EXPECT_EQ(result.status, 3);
+}
+
 // Whoever reads a pipe waits for a writer, and a device has no end: neither is read to remember it.
 TEST(ExitStatus, OneForADeviceOrAPipe) {
   const TempDir folder;

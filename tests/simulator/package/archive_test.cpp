@@ -8,6 +8,7 @@
 #include <csignal>
 #include <cstddef>
 #include <functional>
+#include <optional>
 
 #include "support/files.h"
 #include "support/zip.h"
@@ -159,7 +160,7 @@ TEST(ShrinkGuardDeathTest, GuardsItsOwnTimeAlone) {
     const int fd = memfd_create("page", MFD_CLOEXEC);
     volatile char* const page =
         static_cast<char*>(mmap(nullptr, 4096, PROT_READ, MAP_SHARED, fd, 0));
-    { const ShrinkGuard before; }
+    std::optional<ShrinkGuard>(std::in_place).reset();
     if (guarded) {
       const ShrinkGuard guard;
       const bool is_zero = *page == 0 && guard.HasShrunk();
