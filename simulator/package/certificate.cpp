@@ -44,7 +44,9 @@ std::optional<CertificateFacts> ParseCertificate(std::string_view der) {
   facts.subject = NameText(subject);
   facts.issuer = NameText(issuer);
   facts.is_self_issued = X509_NAME_cmp(subject, issuer) == 0;
-  facts.sha256 = Sha256Hex(der.substr(0, static_cast<size_t>(end - start)));
+  der = der.substr(0, static_cast<size_t>(end - start));
+  facts.sha256 = Sha256Hex(der);
+  facts.sha1 = Sha1Hex(der);
   facts.signature_algorithm = SignatureName(algorithm);
   const int nid = OBJ_obj2nid(algorithm);
   facts.has_known_digest = nid == NID_md5WithRSAEncryption || nid == NID_sha1WithRSAEncryption ||
@@ -75,9 +77,21 @@ AlgorithmFacts ParseAlgorithm(std::string_view der) {
   return AlgorithmOf(algorithm);
 }
 
+std::string Sha1Hex(std::string_view bytes) {
+  uint8_t digest[SHA_DIGEST_LENGTH];
+  SHA1(reinterpret_cast<const uint8_t*>(bytes.data()), bytes.size(), digest);
+  return HexText({reinterpret_cast<const char*>(digest), sizeof(digest)});
+}
+
 std::string Sha256Hex(std::string_view bytes) {
+  Sha256 digest;
+  digest.Add(bytes);
+  return digest.Hex();
+}
+
+std::string Sha256::Hex() {
   uint8_t digest[SHA256_DIGEST_LENGTH];
-  SHA256(reinterpret_cast<const uint8_t*>(bytes.data()), bytes.size(), digest);
+  SHA256_Final(digest, &state_);
   return HexText({reinterpret_cast<const char*>(digest), sizeof(digest)});
 }
 

@@ -2,6 +2,7 @@
 // --print-certs` prints. Read by the platform's crypto library; nothing is verified.
 #pragma once
 
+#include <openssl/sha.h>
 #include <openssl/x509.h>
 
 #include <optional>
@@ -24,6 +25,7 @@ struct CertificateFacts {
   std::string issuer;
   bool is_self_issued = false;  // issuer and subject are the same name
   std::string sha256;           // of the whole certificate
+  std::string sha1;             // of the same, for stores that name a signer by it
   // What it is signed with, such as "SHA384withRSA".
   std::string signature_algorithm;
   bool has_known_digest = false;  // it is signed with RSA PKCS#1 v1.5 over MD5, SHA-1 or SHA-256
@@ -46,7 +48,20 @@ AlgorithmFacts AlgorithmOf(const ASN1_OBJECT* algorithm);
 // Of an AlgorithmIdentifier; nothing where it does not read.
 AlgorithmFacts ParseAlgorithm(std::string_view der);
 
-// The SHA-256 digest in lower-case hexadecimal.
+// The digest in lower-case hexadecimal.
+std::string Sha1Hex(std::string_view bytes);
 std::string Sha256Hex(std::string_view bytes);
+
+// The same of bytes that come in parts.
+class Sha256 {
+ public:
+  Sha256() { SHA256_Init(&state_); }
+  void Add(std::string_view bytes) { SHA256_Update(&state_, bytes.data(), bytes.size()); }
+  // To be called once, after the last part.
+  std::string Hex();
+
+ private:
+  SHA256_CTX state_;
+};
 
 }  // namespace simulator

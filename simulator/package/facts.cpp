@@ -3,6 +3,7 @@
 #include <fcntl.h>
 #include <sys/stat.h>
 #include <sys/statvfs.h>
+#include <unistd.h>
 
 #include <algorithm>
 #include <cerrno>
@@ -22,6 +23,7 @@ namespace {
 constexpr int kOpenFlags = O_RDONLY | O_CLOEXEC | O_NONBLOCK | O_NOCTTY;
 
 FileKind KindOf(int fd, uint64_t size);
+std::string DigestOf(int fd, const IsLate& is_late);
 bool IsText(const std::string& start);
 void ReadArchive(int fd, const IsLate& is_late, PackageFacts* facts);
 std::string FindEntryTwice(int fd);
@@ -48,6 +50,7 @@ PackageFacts LookAt(const std::string& path, const IsLate& is_late) {
   } else {
     facts.size = static_cast<uint64_t>(state.st_size);
     facts.kind = KindOf(file.get(), facts.size);
+    facts.sha256 = DigestOf(file.get(), is_late);
     if (facts.kind == FileKind::kArchive) ReadArchive(file.get(), is_late, &facts);
   }
   return facts;
@@ -72,6 +75,21 @@ FileKind KindOf(int fd, uint64_t size) {
   const std::string start = ReadAt(fd, 0, kStart);
   if (start.compare(0, 4, kLocalHeader) == 0) return FileKind::kCutArchive;
   return IsText(start) ? FileKind::kText : FileKind::kNoArchive;
+}
+
+// Empty once it is late, and where the file cannot be read.
+std::string DigestOf(int fd, const IsLate& is_late) {
+  constexpr size_t kPart = 1 << 20;
+  Sha256 digest;
+  std::string part(kPart, '\0');
+  for (off_t offset = 0; !is_late();) {
+    const ssize_t size = pread(fd, part.data(), part.size(), offset);
+    if (size < 0) break;
+    if (size == 0) return digest.Hex();
+    digest.Add({part.data(), static_cast<size_t>(size)});
+    offset += size;
+  }
+  return {};
 }
 
 // No control characters but those that texts have.

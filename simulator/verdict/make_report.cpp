@@ -33,6 +33,7 @@ Report MakeReport(const RunRecord& run, const PackageFacts& facts, const JudgeOp
   report.events = run.events;
   report.installer = installer;
   report.file_size = facts.size;
+  report.file_sha256 = facts.sha256;
   Reason failure = WhyFailed(run.failure);
   if (failure.cause == nullptr && run.is_silent && !run.signal) {
     const Reason unseen = WhyNotLookedAt(facts, run.has_standard_input);

@@ -102,6 +102,7 @@ struct Report {
   Judgement installer;
   Protection protection;
   uint64_t file_size = 0;
+  std::string file_sha256;  // in lower-case hexadecimal; empty: not known
   std::vector<Link> chain;  // empty for what is no package
 
   Events events;  // all that happened, in order

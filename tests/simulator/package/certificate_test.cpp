@@ -40,6 +40,7 @@ TEST(CertificateFacts, OfAnRsaKey) {
   const auto facts = ParseCertificate(View(der));
   ASSERT_TRUE(facts.has_value());
   EXPECT_EQ(facts->sha256, Told(der, "sha256sum <\"$0\" | cut -d' ' -f1"));
+  EXPECT_EQ(facts->sha1, Told(der, "sha1sum <\"$0\" | cut -d' ' -f1"));
   EXPECT_EQ(facts->key.algorithm, "RSA");
   EXPECT_EQ(facts->key.bits, 2048);
   EXPECT_EQ(facts->key.sha256,

@@ -35,6 +35,14 @@ std::vector<std::string> NamesWhere(const PackageFacts& facts, Predicate holds) 
 
 }  // namespace
 
+// As sha256sum prints it: printf 'no archive\n' | sha256sum.
+TEST(PackageFacts, HaveTheDigestOfTheFile) {
+  const Bytes content = ToBytes("no archive\n");
+  EXPECT_EQ(FactsOf(content).sha256,
+            "cfa9d62752dbe09c9131c8d75dfdf852b5a57f3725c9b639710ea6a68b33f288");
+  EXPECT_EQ(LookAt(DiskFile(content).path(), [] { return true; }).sha256, "");
+}
+
 // mknod makes a socket of it that nobody listens at.
 TEST(FileKind, OfWhatCannotBeOpenedIsNotTold) {
   const TempDir folder;
