@@ -84,7 +84,7 @@ void Become(const Child& child) {
 
 RunResult Wait(pid_t child, int milliseconds) {
   constexpr long long kLongestNap = 50;
-  const long long deadline = Now() + milliseconds;
+  const long long deadline = Now() + milliseconds + 1;  // Now() is rounded down
   for (long long nap = 1;; nap = std::min(2 * nap, kLongestNap)) {
     int status = 0;
     const pid_t ended = waitpid(child, &status, WNOHANG);
