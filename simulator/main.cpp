@@ -23,9 +23,9 @@ int main(int argc, char** argv) {
   inputs.insert(inputs.end(), options.run.trust.begin(), options.run.trust.end());
   inputs.push_back(options.run.tool);
   if (const auto objection = presenter.Objection(inputs)) return Complain(kUsageError, *objection);
-  if (const auto problem = simulator.Prepare()) return Complain(kCannotSimulate, *problem);
+  if (const auto problem = simulator.Prepare()) return presenter.GiveUp(files, *problem);
   if (options.installer.use == InstallerUse::kRequired) {
-    if (const auto missing = installer.Missing()) return Complain(kCannotSimulate, *missing);
+    if (const auto missing = installer.Missing()) return presenter.GiveUp(files, *missing);
   }
   if (!presenter.Begin()) return kCannotSimulate;
   CatchInterruptions();
@@ -50,7 +50,7 @@ int main(int argc, char** argv) {
         }
       },
       [&](size_t i, int seconds) { presenter.ShowProgress(files[i], seconds); });
-  const int status = presenter.Finish();
+  const int status = presenter.Finish(files);
   EndIfInterrupted();
   return status;
 }

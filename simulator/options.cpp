@@ -214,7 +214,11 @@ void AddOutput(CLI::App* app, Options* options) {
         "Print also what the signature leaves out, every\n"
         "signer, and the chain from key to entries");
   app->add_flag("--json", options->show.json, "Print the journal, one JSON object a line");
-  app->add_option("--journal", options->show.journal, "Keep the journal in FILE")
+  app->add_option("--journal", options->show.journal, "Keep the journal in FILE; - is --json")
+      ->type_name("FILE");
+  app->add_option("--junit", options->show.junit, "Write test results to FILE, as JUnit does")
+      ->type_name("FILE");
+  app->add_option("--sarif", options->show.sarif, "Write results to FILE, as a SARIF 2.1.0 log")
       ->type_name("FILE");
   app->add_option("--html", options->show.html, "Write all of it to FILE, a page for a browser")
       ->type_name("FILE");
@@ -251,7 +255,8 @@ void AddVerify(CLI::App* app, Options* options) {
                                             "Sign nothing: ask the kernel which FILEs it\n"
                                             "trusts, by the apktoolkit-verify beside this\n"
                                             "program");
-  for (const char* name : {kInstall, "--strict", "--quiet", "--verbose", "--html"}) {
+  for (const char* name : {kInstall, "--signer", "--werror", "--strict", "--quiet", "--verbose",
+                           "--html", "--junit", "--sarif"}) {
     verify->excludes(app->get_option(name));
   }
 }
@@ -287,6 +292,7 @@ bool ReadLevels(const std::string& text, LevelRange* levels) {
 int ErrorNumber(const std::string& name) {
   constexpr int kLast = 4095;  // the highest that a system call can answer
   for (int error = 1; error <= kLast; ++error) {
+  verify->option_text(" ");  // in place of all that it excludes, which is too long for a line
     const char* const known = strerrorname_np(error);
     if (known != nullptr && name == known) return error;
   }

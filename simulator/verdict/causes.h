@@ -92,6 +92,9 @@ inline constexpr Cause kNotInstalled = {"not-installed", Group::kSimulation, Sev
     ChainLink::kKey, "", "its libraries cannot be laid out: %s",
     "Make room in the folder for temporary files (TMPDIR)."};
 inline constexpr Cause kInterrupted = {"interrupted", Group::kSimulation, Severity::kFailed,
+inline constexpr Cause kNotBegun = {"not-begun", Group::kSimulation, Severity::kFailed,
+    ChainLink::kKey, "", "no file could be simulated: %s",
+    "Fix the reported error, and run again."};
     ChainLink::kKey, "", "it was interrupted", "Run it again."};
 
 // ---- What the file is.
