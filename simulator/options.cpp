@@ -91,7 +91,13 @@ std::optional<int> ParseOptions(int argc, char** argv, Options* options) {
   for (const std::string& word : Split(runner, ' ')) {
     if (!word.empty()) options->run.runner.push_back(word);
   }
-  if (app.count("--tool") == 0) {
+  if (options->show.journal == "-") {
+    options->show.json = true;
+    options->show.journal.clear();
+  }
+  options->judge.now = time(nullptr);
+  options->run.is_own_tool = app.count("--tool") == 0;
+  if (options->run.is_own_tool) {
     options->run.tool =
         ProgramDirectory() + (options->verify ? "/apktoolkit-verify" : "/apktoolkit");
   }

@@ -11,6 +11,8 @@
 
 #include <algorithm>
 #include <cctype>
+#include <filesystem>
+#include <fstream>
 
 #include "simulator/phone/text.h"
 
@@ -91,6 +93,19 @@ std::string Sha256Hex(std::string_view bytes) {
 
 std::string Sha256::Hex() {
   uint8_t digest[SHA256_DIGEST_LENGTH];
+std::string FileSha256(const std::string& path) {
+  std::error_code error;
+  if (!std::filesystem::is_regular_file(path, error)) return {};
+  std::ifstream file(path, std::ios::binary);
+  if (!file) return {};
+  Sha256 digest;
+  std::string part(1 << 20, '\0');
+  while (file.read(part.data(), static_cast<std::streamsize>(part.size())) || file.gcount() > 0) {
+    digest.Add({part.data(), static_cast<size_t>(file.gcount())});
+  }
+  return file.bad() ? std::string() : digest.Hex();
+}
+
   SHA256_Final(digest, &state_);
   return HexText({reinterpret_cast<const char*>(digest), sizeof(digest)});
 }

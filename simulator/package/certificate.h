@@ -54,6 +54,8 @@ std::string Sha256Hex(std::string_view bytes);
 
 // The same of bytes that come in parts.
 class Sha256 {
+// The same of a file's bytes; empty where it is no regular file that can be read.
+std::string FileSha256(const std::string& path);
  public:
   Sha256() { SHA256_Init(&state_); }
   void Add(std::string_view bytes) { SHA256_Update(&state_, bytes.data(), bytes.size()); }

@@ -34,6 +34,7 @@ Report MakeReport(const RunRecord& run, const PackageFacts& facts, const JudgeOp
   report.installer = installer;
   report.file_size = facts.size;
   report.file_sha256 = facts.sha256;
+  report.tool = run.tool;
   Reason failure = WhyFailed(run.failure);
   if (failure.cause == nullptr && run.is_silent && !run.signal) {
     const Reason unseen = WhyNotLookedAt(facts, run.has_standard_input);

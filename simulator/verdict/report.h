@@ -115,6 +115,7 @@ const Item* DecisiveItem(const Report& report);
 // JAR's; null if there is none. Of the report the signer and the key are filled.
 const CertificateFacts* OtherSigner(const Judgement& judgement, const Report& report);
 
+  ToolIdentity tool;
 // The exit status that a verdict stands for.
 ExitStatus StatusOf(Verdict verdict);
 

@@ -13,6 +13,9 @@ Report WholeReport() {
   Report report;
   report.file = "base.apk";
   report.path = "/data/app/od\xe9\".apk";
+  report.file_size = 77;
+  report.file_sha256 = "66";
+  report.tool = {true, "88"};
   report.verdict = Verdict::kPartlySigned;
   report.package_name = "com.app";
   report.items = {
@@ -80,27 +83,34 @@ TEST(VerdictEvent, HoldsTheWholeReport) {
     "items": [
       {"kind": "package", "name": "package", "state": "signed"},
       {"kind": "library", "name": "lib/arm64/a.so", "entry": "lib/arm64-v8a/a.so",
-       "state": "refused", "reason": "kernel-refused", "text": "the kernel refused (EPERM)"},
+       "state": "refused", "reason": "kernel-refused", "text": "the kernel refused (EPERM)",
+       "cure": "The file was good. docs/guide.md, \"When the kernel refuses\", says where to look."},
       {"kind": "library", "name": "lib/arm/a.so", "entry": "lib/armeabi/a.so", "state": "absent",
        "reason": "library-missing",
-       "text": "it does not lie beside the package, where others are"},
+       "text": "it does not lie beside the package, where others are",
+       "cure": "Install the package again, unless the installer leaves it out on purpose."},
       {"kind": "library", "name": "lib/x86/a.so", "entry": "lib/x86/a.so",
        "state": "nothing-to-sign", "reason": "library-other-abi",
-       "text": "no phone of this kind installs it"},
+       "text": "no phone of this kind installs it",
+       "cure": "Nothing: this tool knows arm64-v8a, armeabi-v7a and armeabi."},
       {"kind": "key", "name": "com.app", "state": "registered"}],
     "warnings": [{"reason": "signing-block-damaged",
-                  "text": "the block of the schemes after v1 does not read"}],
+                  "text": "the block of the schemes after v1 does not read",
+                  "cure": "Sign the package again."}],
     "signers": [
-      {"scheme": "v1", "subject": "CN=a", "certificate_sha256": "11", "key_algorithm": "RSA",
+      {"scheme": "v1", "subject": "CN=a", "certificate_sha256": "11", "certificate_sha1": "55",
+       "key_algorithm": "RSA",
        "key_bits": 2048, "key_sha256": "22", "modulus_sha256": "ab"},
-      {"scheme": "v2", "subject": "CN=a", "certificate_sha256": "11", "key_algorithm": "EC",
+      {"scheme": "v2", "subject": "CN=a", "certificate_sha256": "11", "certificate_sha1": "55",
+       "key_algorithm": "EC",
        "key_bits": 256, "key_sha256": "44"},
-      {"scheme": "v3", "subject": "CN=a", "certificate_sha256": "11", "key_algorithm": "RSA",
+      {"scheme": "v3", "subject": "CN=a", "certificate_sha256": "11", "certificate_sha1": "55",
+       "key_algorithm": "RSA",
        "key_bits": 2048, "key_sha256": "22", "modulus_sha256": "33"}],
     "installer": {"state": "judged", "levels": [
       {"first": 27, "last": 29, "installs": true,
        "signers": [{"scheme": "v2", "subject": "CN=a", "certificate_sha256": "11",
-                    "key_algorithm": "RSA", "key_bits": 2048, "key_sha256": "22",
+                    "certificate_sha1": "55", "key_algorithm": "RSA", "key_bits": 2048, "key_sha256": "22",
                     "modulus_sha256": "33"}],
        "errors": [], "warnings": [{"issue": "A_WARNING", "parameters": [], "text": "beware"}]},
       {"first": 30, "installs": false, "signers": [],
@@ -124,6 +134,13 @@ TEST(VerdictEvent, HoldsTheWholeReport) {
 TEST(VerdictEvent, IsOneLine) {
   Report report;
   report.package_name = "a\nb";
+// A tool of somebody else's has no version that is known here.
+TEST(VerdictEvent, OtherToolIsKnownByItsBytesAlone) {
+  Report report;
+  report.tool = {false, "88"};
+  EXPECT_EQ(ParseJournal(VerdictEvent(report)).at(0)["tool"], Json({{"sha256", "88"}}));
+}
+
   const std::string line = VerdictEvent(report);
   EXPECT_EQ(line.find('\n'), line.size() - 1);
 }
