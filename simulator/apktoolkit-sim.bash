@@ -40,7 +40,7 @@ _apktoolkit_sim() {
       compopt -o filenames
       mapfile -t COMPREPLY < <(compgen -c -- "$word" && compgen -f -- "$word")
       ;;
-    --timeout | --jobs | -h | --help | --version) ;;
+    --timeout | --jobs | --signer | -h | --help | --version) ;;
     *)
       if [[ $word == -* ]]; then
         mapfile -t COMPREPLY < <(

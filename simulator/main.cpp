@@ -8,6 +8,7 @@
 #include "simulator/run/queue.h"
 #include "simulator/run/simulator.h"
 #include "simulator/show/presenter.h"
+#include "simulator/verdict/gate.h"
 #include "simulator/verdict/make_report.h"
 
 int main(int argc, char** argv) {
@@ -18,6 +19,7 @@ int main(int argc, char** argv) {
   const std::vector<std::string>& files = options.files;
   Simulator simulator(options.run, has_standard_input);
   Installer installer(options.installer);
+  Gate gate(options.gate);
   Presenter presenter(options.show, files.size());
   std::vector<std::string> inputs = files;
   inputs.insert(inputs.end(), options.run.trust.begin(), options.run.trust.end());
@@ -42,7 +44,8 @@ int main(int argc, char** argv) {
       [&](size_t i) {
         const FileRun run = *std::exchange(runs[i], std::nullopt);
         const Judgement judgement = std::exchange(judgements[i], {});
-        const Report report = MakeReport(run.record, run.facts, options.judge, judgement);
+        Report report = MakeReport(run.record, run.facts, options.judge, judgement);
+        gate.Judge(&report);
         if (options.verify) {
           presenter.ShowAnswer(run.record, report, run.journal);
         } else {

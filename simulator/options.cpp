@@ -4,6 +4,7 @@
 #include <algorithm>
 #include <cmath>
 #include <cstring>
+#include <ctime>
 #include <iostream>
 
 #include "simulator/phone/text.h"
@@ -47,6 +48,7 @@ void AddPhone(CLI::App* app, Options* options);
 void AddKernelAnswer(CLI::App* app, const char* name, int* error, const char* description);
 void AddInstallation(CLI::App* app, Options* options);
 void AddInstaller(CLI::App* app, Options* options);
+void AddGate(CLI::App* app, Options* options);
 void AddOutput(CLI::App* app, Options* options);
 void AddRun(CLI::App* app, Options* options, std::string* runner);
 void AddVerify(CLI::App* app, Options* options);
@@ -72,6 +74,7 @@ std::optional<int> ParseOptions(int argc, char** argv, Options* options) {
   app.option_defaults()->group("The run");
   AddInstallation(&app, options);
   AddInstaller(&app, options);
+  AddGate(&app, options);
   AddOutput(&app, options);
   AddRun(&app, options, &runner);
   AddVerify(&app, options);
@@ -205,6 +208,30 @@ void AddInstaller(CLI::App* app, Options* options) {
       ->check(is_range);
 }
 
+void AddGate(CLI::App* app, Options* options) {
+  std::vector<std::string>* const signers = &options->gate.signers;
+  const auto is_digest = [](const std::string& text) {
+    return ReadDigest(text) ? std::string()
+                            : text +
+                                  " is no SHA-256 digest: 64 hexadecimal digits, or 32 pairs "
+                                  "of them with colons between";
+  };
+  const auto add = [signers](const std::vector<std::string>& texts) {
+    for (const std::string& text : texts) signers->push_back(*ReadDigest(text));
+  };
+  app->add_option_function<std::vector<std::string>>(
+         "--signer", add,
+         "Refuse what is signed by another. SHA256 is the\n"
+         "digest of certificate, public key or modulus;\n"
+         "may be repeated")
+      ->type_name("SHA256")
+      ->check(is_digest)
+      ->allow_extra_args(false);
+  app->add_flag("--werror", options->gate.refuses_warnings,
+                "Warnings count as refusals, and so does a\n"
+                "package that phones install for another signer");
+}
+
 void AddOutput(CLI::App* app, Options* options) {
   const auto print = [app, options](const char* name, Detail detail, const char* description) {
     const auto set = [name, options, detail](int64_t) {
@@ -265,6 +292,7 @@ void AddVerify(CLI::App* app, Options* options) {
                            "--html", "--junit", "--sarif"}) {
     verify->excludes(app->get_option(name));
   }
+  verify->option_text(" ");  // in place of all that it excludes, which is too long for a line
 }
 
 // What begins with "-" and is no option may have been meant for a file.
@@ -298,7 +326,6 @@ bool ReadLevels(const std::string& text, LevelRange* levels) {
 int ErrorNumber(const std::string& name) {
   constexpr int kLast = 4095;  // the highest that a system call can answer
   for (int error = 1; error <= kLast; ++error) {
-  verify->option_text(" ");  // in place of all that it excludes, which is too long for a line
     const char* const known = strerrorname_np(error);
     if (known != nullptr && name == known) return error;
   }

@@ -42,8 +42,8 @@ Members ReasonMembers(const Reason& reason) {
 }
 
 std::string ItemJson(const Item& item) {
-  constexpr const char* kKinds[] = {"package", "jar", "file", "entries",
-                                    "library", "key", "tool", "installer"};
+  constexpr const char* kKinds[] = {"package", "jar",  "file",      "entries", "library",
+                                    "key",     "tool", "installer", "signer",  "warnings"};
   Members members = {{"kind", EncodeText(kKinds[static_cast<size_t>(item.kind)])},
                      {"name", EncodeText(item.name)}};
   if (item.kind == ItemKind::kLibrary) members.emplace_back("entry", EncodeText(item.entry));

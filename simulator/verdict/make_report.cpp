@@ -59,7 +59,7 @@ Report MakeReport(const RunRecord& run, const PackageFacts& facts, const JudgeOp
   AddToolItems(run, options, &report.items);
   if (own.kind == ItemKind::kPackage) AddInstallerItem(installer, options, &report.items);
   DescribeSigners(run, facts, &report);
-  AddWarnings(FindWarnings(run, facts, report), options, &report);
+  AddWarnings(FindWarnings(run, facts, report, options.now), options, &report);
   report.verdict = JudgeWithInstaller(Judge(report.items), report);
   report.protection = FindProtection(facts, report.items);
   if (own.kind == ItemKind::kPackage) report.chain = MakeChain(facts, report);
@@ -95,9 +95,9 @@ const Item* DecisiveItem(const Report& report) {
 }
 
 ExitStatus StatusOf(Verdict verdict) {
-  constexpr ExitStatus kStatuses[] = {kAllSigned,   kAllSigned,   kAllSigned,
-                                      kSomeRefused, kSomeRefused, kSomeRefused,
-                                      kSomeRefused, kNotLookedAt, kCannotSimulate};
+  constexpr ExitStatus kStatuses[] = {kAllSigned,   kAllSigned,     kAllSigned,   kSomeRefused,
+                                      kSomeRefused, kSomeRefused,   kSomeRefused, kSomeRefused,
+                                      kNotLookedAt, kCannotSimulate};
   return kStatuses[static_cast<size_t>(verdict)];
 }
 

@@ -41,6 +41,7 @@ Report WholeReport() {
   report.signer.emplace();
   report.signer->subject = "CN=a";
   report.signer->sha256 = "11";
+  report.signer->sha1 = "55";
   report.signer->key = {"RSA", 2048, "22", "33"};
   report.newer = {{"v2", *report.signer}};
   report.newer[0].certificate.key = {"EC", 256, "44", ""};
@@ -79,6 +80,8 @@ TEST(VerdictEvent, HoldsTheWholeReport) {
   const Json event = ParseJournal(VerdictEvent(WholeReport())).at(0);
   EXPECT_EQ(event, Json::parse(R"json({
     "event": "verdict", "file": "base.apk", "path": "/data/app/od\uf7e9\".apk",
+    "size": 77, "sha256": "66", "version": ")json" APKTOOLKIT_VERSION R"json(",
+    "tool": {"sha256": "88", "version": ")json" APKTOOLKIT_VERSION R"json("},
     "verdict": "partly-signed", "status": 1, "package": "com.app", "payload": "2000ab",
     "items": [
       {"kind": "package", "name": "package", "state": "signed"},
@@ -131,9 +134,6 @@ TEST(VerdictEvent, HoldsTheWholeReport) {
       {"link": "manifest", "state": "not-reached", "text": "y"}]})json"));
 }
 
-TEST(VerdictEvent, IsOneLine) {
-  Report report;
-  report.package_name = "a\nb";
 // A tool of somebody else's has no version that is known here.
 TEST(VerdictEvent, OtherToolIsKnownByItsBytesAlone) {
   Report report;
@@ -141,6 +141,9 @@ TEST(VerdictEvent, OtherToolIsKnownByItsBytesAlone) {
   EXPECT_EQ(ParseJournal(VerdictEvent(report)).at(0)["tool"], Json({{"sha256", "88"}}));
 }
 
+TEST(VerdictEvent, IsOneLine) {
+  Report report;
+  report.package_name = "a\nb";
   const std::string line = VerdictEvent(report);
   EXPECT_EQ(line.find('\n'), line.size() - 1);
 }
@@ -155,6 +158,7 @@ TEST(VerdictEvent, EveryVerdictHasACodeAndAStatus) {
   EXPECT_EQ(code(Verdict::kSigned), "signed 0");
   EXPECT_EQ(code(Verdict::kOtherSigner), "other-signer 0");
   EXPECT_EQ(code(Verdict::kNotInstallable), "not-installable 1");
+  EXPECT_EQ(code(Verdict::kNotAccepted), "not-accepted 1");
   EXPECT_EQ(code(Verdict::kTrustedJar), "trusted-jar 0");
   EXPECT_EQ(code(Verdict::kPartlySigned), "partly-signed 1");
   EXPECT_EQ(code(Verdict::kRefused), "refused 1");
@@ -179,6 +183,8 @@ TEST(VerdictEvent, EveryKindAndStateHasACode) {
   EXPECT_EQ(item(ItemKind::kKey, ItemState::kRefused), "key refused");
   EXPECT_EQ(item(ItemKind::kTool, ItemState::kNothing), "tool nothing-to-sign");
   EXPECT_EQ(item(ItemKind::kInstaller, ItemState::kRefused), "installer refused");
+  EXPECT_EQ(item(ItemKind::kSigner, ItemState::kRefused), "signer refused");
+  EXPECT_EQ(item(ItemKind::kWarnings, ItemState::kRefused), "warnings refused");
 }
 
 TEST(VerdictEvent, EveryStateOfALinkHasACode) {
