@@ -21,7 +21,8 @@ constexpr char kDescription[] =
 constexpr char kFooter[] =
     "Exit status, the highest of all FILEs:\n"
     "  0  all was signed that was to be signed\n"
-    "  1  something was refused, by the tool or by a phone's installer\n"
+    "  1  something was refused: by the tool, by a phone's installer, or by --signer\n"
+    "     or --werror\n"
     "  2  the command line is wrong\n"
     "  3  the simulation could not run, or did not end in time\n"
     "  4  the tool could not look at a FILE: missing, no permission, read-only\n"

@@ -69,12 +69,14 @@ TEST(CertificateFacts, LastSecond) {
     const std::string told = facts->not_after ? std::to_string(*facts->not_after) : "none";
     const std::string command =
         "date +%s -d \"$(openssl x509 -inform DER -in \"$0\" -noout -enddate | sed s/.*=//)\"";
-    if (facts->not_after) EXPECT_EQ(told, Told(made, command)) << end;
+    if (facts->not_after) {
+      EXPECT_EQ(told, Told(made, command)) << end;
+    }
     return told;
   };
   constexpr uint8_t kGeneralizedTime = 0x18;
   EXPECT_EQ(last(der::kUtcTime, "700101000001Z"), "1");
-  EXPECT_EQ(last(der::kUtcTime, "490102030405Z"), "2493083045");
+  EXPECT_EQ(last(der::kUtcTime, "490102030405Z"), "2493169445");
   EXPECT_EQ(last(der::kUtcTime, "690101000000Z").substr(0, 1), "-");
   EXPECT_EQ(last(kGeneralizedTime, "99991231235959Z"), "253402300799");
   EXPECT_EQ(last(der::kUtcTime, "no time"), "none");

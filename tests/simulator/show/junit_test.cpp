@@ -138,5 +138,5 @@ TEST(Junit, EveryCharacterMakesAWholeDocument) {
   for (const uint32_t code : {0x10000U, 0x1f600U, 0x1fffeU, 0x10fffdU, 0x10ffffU}) add(code);
   const std::string read = ReadByPython(XmlOf({HostileReport(text)}));
   EXPECT_NE(read.find("testcase "), std::string::npos);
-  EXPECT_NE(read.find("\\xef\\xbf\\xbf"), std::string::npos);
+  EXPECT_NE(read.find(R"(\\xef\\xbf\\xbf)"), std::string::npos);
 }

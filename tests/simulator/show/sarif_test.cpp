@@ -117,7 +117,8 @@ TEST(Sarif, FileThatWasNotJudgedIsAnErrorAndTheRunWasNotSuccessful) {
   Report refused = Good("a.apk");
   refused.verdict = Verdict::kRefused;
   refused.items = {RefusedFor(&cause::kToolError, "a")};
-  EXPECT_EQ(LogOf({refused})["runs"][0]["invocations"], Json({{{"executionSuccessful", true}}}));
+  EXPECT_EQ(LogOf({refused})["runs"][0]["invocations"],
+            Json::parse(R"([{"executionSuccessful": true}])"));
 }
 
 TEST(Sarif, HostileTextsAreTexts) {

@@ -138,7 +138,7 @@ TEST(VerdictEvent, HoldsTheWholeReport) {
 TEST(VerdictEvent, OtherToolIsKnownByItsBytesAlone) {
   Report report;
   report.tool = {false, "88"};
-  EXPECT_EQ(ParseJournal(VerdictEvent(report)).at(0)["tool"], Json({{"sha256", "88"}}));
+  EXPECT_EQ(ParseJournal(VerdictEvent(report)).at(0)["tool"], Json::parse(R"({"sha256": "88"})"));
 }
 
 TEST(VerdictEvent, IsOneLine) {
