@@ -40,14 +40,13 @@ _apktoolkit_sim() {
       compopt -o filenames
       mapfile -t COMPREPLY < <(compgen -c -- "$word" && compgen -f -- "$word")
       ;;
-    --timeout | --jobs | -h | --help | --version) ;;
+    --timeout | --jobs | --signer | -h | --help | --version) ;;
     *)
       if [[ $word == -* ]]; then
         mapfile -t COMPREPLY < <(
           compgen -W "--api --help --html --install --installer --integrity --jobs --journal
-            --json --quiet --runner --sign-errno --state --strict --timeout --tool --trust
-            --verbose --verify
-            --verify-errno --version --zu-result" -- "$word"
+            --json --junit --quiet --runner --sarif --sign-errno --signer --state --strict --timeout
+            --tool --trust --verbose --verify --verify-errno --version --werror --zu-result" -- "$word"
         )
       else
         compopt -o filenames

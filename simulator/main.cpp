@@ -8,6 +8,7 @@
 #include "simulator/run/queue.h"
 #include "simulator/run/simulator.h"
 #include "simulator/show/presenter.h"
+#include "simulator/verdict/gate.h"
 #include "simulator/verdict/make_report.h"
 
 int main(int argc, char** argv) {
@@ -18,14 +19,15 @@ int main(int argc, char** argv) {
   const std::vector<std::string>& files = options.files;
   Simulator simulator(options.run, has_standard_input);
   Installer installer(options.installer);
+  Gate gate(options.gate);
   Presenter presenter(options.show, files.size());
   std::vector<std::string> inputs = files;
   inputs.insert(inputs.end(), options.run.trust.begin(), options.run.trust.end());
   inputs.push_back(options.run.tool);
   if (const auto objection = presenter.Objection(inputs)) return Complain(kUsageError, *objection);
-  if (const auto problem = simulator.Prepare()) return Complain(kCannotSimulate, *problem);
+  if (const auto problem = simulator.Prepare()) return presenter.GiveUp(files, *problem);
   if (options.installer.use == InstallerUse::kRequired) {
-    if (const auto missing = installer.Missing()) return Complain(kCannotSimulate, *missing);
+    if (const auto missing = installer.Missing()) return presenter.GiveUp(files, *missing);
   }
   if (!presenter.Begin()) return kCannotSimulate;
   CatchInterruptions();
@@ -42,7 +44,8 @@ int main(int argc, char** argv) {
       [&](size_t i) {
         const FileRun run = *std::exchange(runs[i], std::nullopt);
         const Judgement judgement = std::exchange(judgements[i], {});
-        const Report report = MakeReport(run.record, run.facts, options.judge, judgement);
+        Report report = MakeReport(run.record, run.facts, options.judge, judgement);
+        gate.Judge(&report);
         if (options.verify) {
           presenter.ShowAnswer(run.record, report, run.journal);
         } else {
@@ -50,7 +53,7 @@ int main(int argc, char** argv) {
         }
       },
       [&](size_t i, int seconds) { presenter.ShowProgress(files[i], seconds); });
-  const int status = presenter.Finish();
+  const int status = presenter.Finish(files);
   EndIfInterrupted();
   return status;
 }

@@ -4,6 +4,7 @@
 #include <algorithm>
 #include <cmath>
 #include <cstring>
+#include <ctime>
 #include <iostream>
 
 #include "simulator/phone/text.h"
@@ -20,7 +21,8 @@ constexpr char kDescription[] =
 constexpr char kFooter[] =
     "Exit status, the highest of all FILEs:\n"
     "  0  all was signed that was to be signed\n"
-    "  1  something was refused, by the tool or by a phone's installer\n"
+    "  1  something was refused: by the tool, by a phone's installer, or by --signer\n"
+    "     or --werror\n"
     "  2  the command line is wrong\n"
     "  3  the simulation could not run, or did not end in time\n"
     "  4  the tool could not look at a FILE: missing, no permission, read-only\n"
@@ -47,6 +49,7 @@ void AddPhone(CLI::App* app, Options* options);
 void AddKernelAnswer(CLI::App* app, const char* name, int* error, const char* description);
 void AddInstallation(CLI::App* app, Options* options);
 void AddInstaller(CLI::App* app, Options* options);
+void AddGate(CLI::App* app, Options* options);
 void AddOutput(CLI::App* app, Options* options);
 void AddRun(CLI::App* app, Options* options, std::string* runner);
 void AddVerify(CLI::App* app, Options* options);
@@ -72,6 +75,7 @@ std::optional<int> ParseOptions(int argc, char** argv, Options* options) {
   app.option_defaults()->group("The run");
   AddInstallation(&app, options);
   AddInstaller(&app, options);
+  AddGate(&app, options);
   AddOutput(&app, options);
   AddRun(&app, options, &runner);
   AddVerify(&app, options);
@@ -91,7 +95,13 @@ std::optional<int> ParseOptions(int argc, char** argv, Options* options) {
   for (const std::string& word : Split(runner, ' ')) {
     if (!word.empty()) options->run.runner.push_back(word);
   }
-  if (app.count("--tool") == 0) {
+  if (options->show.journal == "-") {
+    options->show.json = true;
+    options->show.journal.clear();
+  }
+  options->judge.now = time(nullptr);
+  options->run.is_own_tool = app.count("--tool") == 0;
+  if (options->run.is_own_tool) {
     options->run.tool =
         ProgramDirectory() + (options->verify ? "/apktoolkit-verify" : "/apktoolkit");
   }
@@ -199,6 +209,30 @@ void AddInstaller(CLI::App* app, Options* options) {
       ->check(is_range);
 }
 
+void AddGate(CLI::App* app, Options* options) {
+  std::vector<std::string>* const signers = &options->gate.signers;
+  const auto is_digest = [](const std::string& text) {
+    return ReadDigest(text) ? std::string()
+                            : text +
+                                  " is no SHA-256 digest: 64 hexadecimal digits, or 32 pairs "
+                                  "of them with colons between";
+  };
+  const auto add = [signers](const std::vector<std::string>& texts) {
+    for (const std::string& text : texts) signers->push_back(*ReadDigest(text));
+  };
+  app->add_option_function<std::vector<std::string>>(
+         "--signer", add,
+         "Refuse what is signed by another. SHA256 is the\n"
+         "digest of certificate, public key or modulus;\n"
+         "may be repeated")
+      ->type_name("SHA256")
+      ->check(is_digest)
+      ->allow_extra_args(false);
+  app->add_flag("--werror", options->gate.refuses_warnings,
+                "Warnings count as refusals, and so does a\n"
+                "package that phones install for another signer");
+}
+
 void AddOutput(CLI::App* app, Options* options) {
   const auto print = [app, options](const char* name, Detail detail, const char* description) {
     const auto set = [name, options, detail](int64_t) {
@@ -214,7 +248,11 @@ void AddOutput(CLI::App* app, Options* options) {
         "Print also what the signature leaves out, every\n"
         "signer, and the chain from key to entries");
   app->add_flag("--json", options->show.json, "Print the journal, one JSON object a line");
-  app->add_option("--journal", options->show.journal, "Keep the journal in FILE")
+  app->add_option("--journal", options->show.journal, "Keep the journal in FILE; - is --json")
+      ->type_name("FILE");
+  app->add_option("--junit", options->show.junit, "Write test results to FILE, as JUnit does")
+      ->type_name("FILE");
+  app->add_option("--sarif", options->show.sarif, "Write results to FILE, as a SARIF 2.1.0 log")
       ->type_name("FILE");
   app->add_option("--html", options->show.html, "Write all of it to FILE, a page for a browser")
       ->type_name("FILE");
@@ -251,9 +289,11 @@ void AddVerify(CLI::App* app, Options* options) {
                                             "Sign nothing: ask the kernel which FILEs it\n"
                                             "trusts, by the apktoolkit-verify beside this\n"
                                             "program");
-  for (const char* name : {kInstall, "--strict", "--quiet", "--verbose", "--html"}) {
+  for (const char* name : {kInstall, "--signer", "--werror", "--strict", "--quiet", "--verbose",
+                           "--html", "--junit", "--sarif"}) {
     verify->excludes(app->get_option(name));
   }
+  verify->option_text(" ");  // in place of all that it excludes, which is too long for a line
 }
 
 // What begins with "-" and is no option may have been meant for a file.

@@ -8,6 +8,7 @@
 #include "simulator/installer/installer.h"
 #include "simulator/run/simulator.h"
 #include "simulator/show/presenter.h"
+#include "simulator/verdict/gate.h"
 #include "simulator/verdict/make_report.h"
 
 namespace simulator {
@@ -16,6 +17,7 @@ struct Options {
   RunOptions run;
   InstallerOptions installer;
   JudgeOptions judge;
+  GateOptions gate;
   ShowOptions show;
   bool verify = false;             // ask the kernel which files it trusts, and nothing else
   std::vector<std::string> files;  // what the tool is run for; at least one

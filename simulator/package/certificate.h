@@ -5,6 +5,7 @@
 #include <openssl/sha.h>
 #include <openssl/x509.h>
 
+#include <cstdint>
 #include <optional>
 #include <string>
 #include <string_view>
@@ -29,6 +30,8 @@ struct CertificateFacts {
   // What it is signed with, such as "SHA384withRSA".
   std::string signature_algorithm;
   bool has_known_digest = false;  // it is signed with RSA PKCS#1 v1.5 over MD5, SHA-1 or SHA-256
+  // The last second at which it is valid, counted since 1970 in UTC; none: it does not read.
+  std::optional<int64_t> not_after;
   PublicKey key;
   // The contents of the two SignerIdentifiers by which a signature can name the certificate: issuer
   // and serial number, and the subject key identifier, which may be empty.
@@ -51,6 +54,8 @@ AlgorithmFacts ParseAlgorithm(std::string_view der);
 // The digest in lower-case hexadecimal.
 std::string Sha1Hex(std::string_view bytes);
 std::string Sha256Hex(std::string_view bytes);
+// The same of a file's bytes; empty where it is no regular file that can be read.
+std::string FileSha256(const std::string& path);
 
 // The same of bytes that come in parts.
 class Sha256 {

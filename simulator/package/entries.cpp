@@ -18,6 +18,7 @@ using ApkTools::EntryDigests;
 
 EntryDigest Compare(Archive* archive, const EntryDigests& manifest, const ArchiveEntry& entry,
                     Apk* tool);
+bool IsSha1Digest(const std::string& name, Apk* tool);
 bool IsKnownDigest(const std::string& name, Apk* tool);
 bool IsSignatureName(const std::string& name);
 std::vector<std::string> FindMissing(std::vector<uint8_t> text, const EntryDigests& manifest,
@@ -40,10 +41,16 @@ PackageEntries CompareEntries(Archive* archive, std::vector<uint8_t> manifest,
       result = is_late() ? EntryDigest::kNotCompared : Compare(archive, digests, entry, &tool);
     }
     const bool is_signature = IsSignatureName(entry.name);
-    entries.all.push_back({std::move(entry), is_listed, is_signature, result});
+    const bool has_sha1 = is_listed && IsSha1Digest(digest_name, &tool);
+    entries.all.push_back({std::move(entry), is_listed, is_signature, result, has_sha1});
   }
   entries.missing = FindMissing(std::move(manifest), digests, entries.all);
   return entries;
+}
+
+bool IsSha1Digest(const std::string& name) {
+  Apk tool(-1);
+  return IsSha1Digest(name, &tool);
 }
 
 namespace {
@@ -60,12 +67,18 @@ EntryDigest Compare(Archive* archive, const EntryDigests& manifest, const Archiv
   return IsKnownDigest(digest_name, tool) ? EntryDigest::kDiffers : EntryDigest::kNotCompared;
 }
 
+// The tool then finds that of no bytes right.
+bool IsSha1Digest(const std::string& name, Apk* tool) {
+  std::vector<uint8_t> sha1;
+  ComputeSHA1Digest({}, sha1);
+  return tool->VerifyData(name, sha1, {});
+}
+
 // Whether the tool reads digests of this name: it then finds one of its two right for no bytes.
 bool IsKnownDigest(const std::string& name, Apk* tool) {
-  std::vector<uint8_t> sha1, sha256;
-  ComputeSHA1Digest({}, sha1);
+  std::vector<uint8_t> sha256;
   ComputeSHA256Digest({}, sha256);
-  return tool->VerifyData(name, sha1, {}) || tool->VerifyData(name, sha256, {});
+  return IsSha1Digest(name, tool) || tool->VerifyData(name, sha256, {});
 }
 
 // The manifest, signature files and their blocks, which no manifest lists.

@@ -26,6 +26,7 @@ struct ListedEntry {
   bool is_listed;     // the manifest has a digest for it
   bool is_signature;  // it belongs to a JAR signature itself
   EntryDigest digest = EntryDigest::kUnlisted;
+  bool has_sha1 = false;  // the digest by which the tool would know it is a SHA-1 digest
 };
 
 struct PackageEntries {
@@ -39,5 +40,8 @@ using IsLate = std::function<bool()>;
 // `manifest`: the text of META-INF/MANIFEST.MF; may be empty.
 PackageEntries CompareEntries(Archive* archive, std::vector<uint8_t> manifest,
                               const IsLate& is_late);
+
+// Whether the tool takes a digest of this name, such as "SHA1-Digest", for one of SHA-1.
+bool IsSha1Digest(const std::string& name);
 
 }  // namespace simulator

@@ -47,6 +47,12 @@ struct Failure {
   std::string detail;
 };
 
+// Which tool ran.
+struct ToolIdentity {
+  bool is_own = false;  // the one beside the simulator, which is of the simulator's version
+  std::string sha256;   // of its bytes, in lower-case hexadecimal; empty: they cannot be read
+};
+
 struct RunRecord {
   Events events;  // all that happened, in order
   std::string file;
@@ -75,6 +81,7 @@ struct RunRecord {
 
   // What the simulator itself knows of the run.
   Failure failure;
+  ToolIdentity tool;
   bool has_standard_input = true;  // the tool was started with one
   // The library entries that --install does not take for their names, and those that it could not
   // extract.

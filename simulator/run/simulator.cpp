@@ -69,6 +69,7 @@ std::optional<std::string> Simulator::Prepare() {
   kernel_descriptor_.emplace(open(kernel_.c_str(), O_RDONLY | O_CLOEXEC));
   if (kernel_descriptor_->get() < 0) return "there is no stand-in " + kernel_ + ErrnoText();
   if (access(options_.tool.c_str(), X_OK) != 0) return "cannot run " + options_.tool + ErrnoText();
+  tool_sha256_ = FileSha256(options_.tool);
   if (!signed_.Load()) return "cannot use the directory " + options_.state;
   return {};
 }
@@ -94,6 +95,7 @@ FileRun Simulator::Run(const std::string& file) {
   run.record = TakeApart(ParseEvents(run.journal));
   RememberSigned(run.record.events, &task);
   run.record.failure = task.failure;
+  run.record.tool = {options_.is_own_tool, tool_sha256_};
   run.record.has_standard_input = has_standard_input_;
   run.record.was_laid_out = options_.abi.has_value();
   run.record.not_laid_out = installation.left_out();

@@ -23,6 +23,7 @@ struct RunOptions {
   std::optional<InstalledAbi> abi;  // whose libraries are laid out; none: the file stays as it lies
   unsigned jobs = 1;                // how many files at a time
   std::string tool;                 // the program that is run
+  bool is_own_tool = false;         // it is the one beside this program
   std::vector<std::string> runner;  // words before the tool, such as an emulator's
   double timeout = 30;              // seconds, for each file
 };
@@ -61,6 +62,7 @@ class Simulator {
   const std::string kernel_;  // the path of the kernel stand-in
   SignedBytes signed_;
   std::optional<ScopedFd> kernel_descriptor_;
+  std::string tool_sha256_;
 };
 
 }  // namespace simulator

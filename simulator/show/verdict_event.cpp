@@ -36,12 +36,14 @@ const char* StateCode(const Item& item) {
 }
 
 Members ReasonMembers(const Reason& reason) {
-  return {{"reason", EncodeText(reason.cause->code)}, {"text", EncodeText(reason.Text())}};
+  return {{"reason", EncodeText(reason.cause->code)},
+          {"text", EncodeText(reason.Text())},
+          {"cure", EncodeText(reason.cause->cure)}};
 }
 
 std::string ItemJson(const Item& item) {
-  constexpr const char* kKinds[] = {"package", "jar", "file", "entries",
-                                    "library", "key", "tool", "installer"};
+  constexpr const char* kKinds[] = {"package", "jar",  "file",      "entries", "library",
+                                    "key",     "tool", "installer", "signer",  "warnings"};
   Members members = {{"kind", EncodeText(kKinds[static_cast<size_t>(item.kind)])},
                      {"name", EncodeText(item.name)}};
   if (item.kind == ItemKind::kLibrary) members.emplace_back("entry", EncodeText(item.entry));
@@ -57,6 +59,7 @@ std::string SignerJson(const std::string& scheme, const CertificateFacts& signer
   Members members = {{"scheme", EncodeText(scheme)},
                      {"subject", EncodeText(signer.subject)},
                      {"certificate_sha256", EncodeText(signer.sha256)},
+                     {"certificate_sha1", EncodeText(signer.sha1)},
                      {"key_algorithm", EncodeText(signer.key.algorithm)},
                      {"key_bits", std::to_string(signer.key.bits)},
                      {"key_sha256", EncodeText(signer.key.sha256)}};
@@ -154,6 +157,13 @@ std::string RangeJson(const RangeJudgement& range) {
   return Object(members);
 }
 
+// The tool beside the simulator was built with it, and has its version.
+std::string ToolJson(const ToolIdentity& tool) {
+  Members members = {{"sha256", EncodeText(tool.sha256)}};
+  if (tool.is_own) members.emplace_back("version", EncodeText(APKTOOLKIT_VERSION));
+  return Object(members);
+}
+
 std::string InstallerJson(const Judgement& judgement) {
   constexpr const char* kStates[] = {"not-asked", "missing", "gave-up", "judged"};
   return Object({{"state", EncodeText(kStates[static_cast<size_t>(judgement.state)])},
@@ -165,6 +175,8 @@ std::string InstallerJson(const Judgement& judgement) {
 std::string VerdictEvent(const Report& report) {
   Event event("verdict");
   event.Text("file", report.file).Text("path", report.path);
+  event.Number("size", static_cast<int64_t>(report.file_size)).Text("sha256", report.file_sha256);
+  event.Text("version", APKTOOLKIT_VERSION).Json("tool", ToolJson(report.tool));
   event.Text("verdict", WordsOf(report.verdict).code).Number("status", StatusOf(report.verdict));
   event.Text("package", report.package_name).Text("payload", report.payload);
   event.Json("items", List(report.items, ItemJson));

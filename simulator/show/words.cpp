@@ -14,6 +14,7 @@ constexpr VerdictWords kVerdicts[] = {
     {"trusted-jar", "TRUSTED JAR", "trusted JAR", "trusted JARs", Mood::kGood},
     {"partly-signed", "PARTLY SIGNED", "partly signed", "partly signed", Mood::kMixed},
     {"not-installable", "NOT INSTALLABLE", "not installable", "not installable", Mood::kBad},
+    {"not-accepted", "NOT ACCEPTED", "not accepted", "not accepted", Mood::kBad},
     {"refused", "REFUSED", "refused", "refused", Mood::kBad},
     {"not-trusted-jar", "NOT TRUSTED JAR", "JAR not trusted", "JARs not trusted", Mood::kBad},
     {"not-looked-at", "NOT LOOKED AT", "not looked at", "not looked at", Mood::kBad},
@@ -43,6 +44,12 @@ std::vector<std::string> HeadFacts(const Report& report, const char* ellipsis) {
   const std::string reason = DecisiveReason(report);
   std::vector<std::string> facts = {reason};
   if (reason.empty()) facts = OwnerFacts(report, ellipsis);
+  for (const Item& item : report.items) {
+    const bool is_told = &item == DecisiveItem(report);
+    const bool counts = item.kind == ItemKind::kSigner && item.state == ItemState::kRefused &&
+                        item.reason.cause->severity == Severity::kRefused;
+    if (counts && !is_told) facts.push_back(item.reason.Text());
+  }
   for (const std::string& alarm : AlarmFacts(report)) facts.push_back(alarm);
   const size_t warnings = report.warnings.size();
   if (warnings > 0) facts.push_back(Counted(warnings, "warning", "warnings"));
@@ -101,7 +108,8 @@ std::string OutcomeOf(const Item& item, Verdict verdict) {
   }
   if (item.state != ItemState::kRefused) return "nothing to sign: " + reason;
   if (item.kind == ItemKind::kTool || item.kind == ItemKind::kEntries ||
-      item.kind == ItemKind::kInstaller) {
+      item.kind == ItemKind::kInstaller || item.kind == ItemKind::kSigner ||
+      item.kind == ItemKind::kWarnings) {
     return reason;
   }
   if (item.kind == ItemKind::kKey) return "not registered: " + reason;

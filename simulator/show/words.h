@@ -39,7 +39,7 @@ std::vector<std::string> AlarmFacts(const Report& report);
 std::string DecisiveReason(const Report& report);
 
 // The line of the verdict has these behind the file: the decisive reason, or else whose package it
-// is; then the alarms, and the number of all warnings.
+// is; then a signer who was not expected, the alarms, and the number of all warnings.
 std::vector<std::string> HeadFacts(const Report& report, const char* ellipsis);
 
 // What stands before a line.

@@ -17,6 +17,7 @@ enum class Group {
   kKey,
   kTool,
   kInstaller,  // a phone's installer would not take the package
+  kGate,       // the command line demands something else
   kWarning,    // all may be signed, and yet
 };
 
@@ -91,6 +92,9 @@ inline constexpr Cause kStateNotKept = {"state-not-kept", Group::kSimulation, Se
 inline constexpr Cause kNotInstalled = {"not-installed", Group::kSimulation, Severity::kFailed,
     ChainLink::kKey, "", "its libraries cannot be laid out: %s",
     "Make room in the folder for temporary files (TMPDIR)."};
+inline constexpr Cause kNotBegun = {"not-begun", Group::kSimulation, Severity::kFailed,
+    ChainLink::kKey, "", "no file could be simulated: %s",
+    "Fix the reported error, and run again."};
 inline constexpr Cause kInterrupted = {"interrupted", Group::kSimulation, Severity::kFailed,
     ChainLink::kKey, "", "it was interrupted", "Run it again."};
 
@@ -377,6 +381,26 @@ inline constexpr Cause kInstallerGaveUp = {"installer-gave-up", Group::kInstalle
     "trust this package, if it is not of your making. A large one may need a larger --timeout; "
     "--installer=off judges without the installer."};
 
+// ---- The gate: what the command line demands.
+inline constexpr Cause kSignerUnexpected = {"signer-unexpected", Group::kGate, Severity::kRefused,
+    ChainLink::kNone, "", "its signer is none that --signer names: %s",
+    "Sign it with the key that --signer names; a rotated key has to be named as well. If it is not "
+    "of your making: do not trust it."};
+inline constexpr Cause kSignerNone = {"signer-none", Group::kGate, Severity::kRefused,
+    ChainLink::kNone, "", "it has no signer: the kernel trusts the JAR by its bytes (%s)",
+    "Look at JARs without --signer."};
+inline constexpr Cause kSignerNotVerified = {"signer-not-verified", Group::kGate,
+    Severity::kFollows, ChainLink::kNone, "", "its signer is not known: the tool verified no "
+    "signature (%s)", "Fix what the file is refused for; this follows."};
+inline constexpr Cause kSignerDiffers = {"signer-differs", Group::kGate, Severity::kRefused,
+    ChainLink::kNone, "", "the files of a package must have one signer: %s",
+    "Sign all files of the package with one key and certificate. Look at other builds of it in "
+    "runs of their own."};
+
+inline constexpr Cause kWarningsRefused = {"warnings-refused", Group::kGate, Severity::kRefused,
+    ChainLink::kNone, "", "a warning counts as a refusal (--werror): %s",
+    "See what to do about each warning."};
+
 // ---- Warnings: all may be signed, and yet.
 inline constexpr Cause kOtherKey = {"other-key", Group::kWarning, Severity::kWarning,
     ChainLink::kNone, "", "%s is of another key than the JAR signature: phones install the package "
@@ -413,6 +437,14 @@ inline constexpr Cause kWeakKey = {"weak-key", Group::kWarning, Severity::kWarni
 inline constexpr Cause kDebugKey = {"debug-key", Group::kWarning, Severity::kWarning,
     ChainLink::kNone, "", "it is signed with a debug certificate (CN=Android Debug), of which each "
     "workstation makes its own", "Sign a release with a key of its own."};
+inline constexpr Cause kWeakDigest = {"weak-digest", Group::kWarning, Severity::kWarning,
+    ChainLink::kNone, "", "SHA-1 or MD5 is in use: %s",
+    "Sign it again with SHA-256: apksigner does so with --min-sdk-version 18. Certify the key of a "
+    "new app with SHA-256 as well; for a published one that makes another signer."};
+inline constexpr Cause kCertificateExpired = {"certificate-expired", Group::kWarning,
+    Severity::kWarning, ChainLink::kNone, "", "its certificate expired on %s",
+    "Phones install it all the same, and a new certificate makes another signer of a published "
+    "app. Make the one of a new app to last: keytool -validity 10000."};
 inline constexpr Cause kUnlistedEntries = {"unlisted-entries", Group::kWarning, Severity::kWarning,
     ChainLink::kNone, "", "the signature does not protect %s: no digest in the manifest",
     "Sign the package again, as the last step that changes it; --verbose lists them."};

@@ -34,6 +34,7 @@ Report MakeReport(const RunRecord& run, const PackageFacts& facts, const JudgeOp
   report.installer = installer;
   report.file_size = facts.size;
   report.file_sha256 = facts.sha256;
+  report.tool = run.tool;
   Reason failure = WhyFailed(run.failure);
   if (failure.cause == nullptr && run.is_silent && !run.signal) {
     const Reason unseen = WhyNotLookedAt(facts, run.has_standard_input);
@@ -58,7 +59,7 @@ Report MakeReport(const RunRecord& run, const PackageFacts& facts, const JudgeOp
   AddToolItems(run, options, &report.items);
   if (own.kind == ItemKind::kPackage) AddInstallerItem(installer, options, &report.items);
   DescribeSigners(run, facts, &report);
-  AddWarnings(FindWarnings(run, facts, report), options, &report);
+  AddWarnings(FindWarnings(run, facts, report, options.now), options, &report);
   report.verdict = JudgeWithInstaller(Judge(report.items), report);
   report.protection = FindProtection(facts, report.items);
   if (own.kind == ItemKind::kPackage) report.chain = MakeChain(facts, report);
@@ -94,9 +95,9 @@ const Item* DecisiveItem(const Report& report) {
 }
 
 ExitStatus StatusOf(Verdict verdict) {
-  constexpr ExitStatus kStatuses[] = {kAllSigned,   kAllSigned,   kAllSigned,
-                                      kSomeRefused, kSomeRefused, kSomeRefused,
-                                      kSomeRefused, kNotLookedAt, kCannotSimulate};
+  constexpr ExitStatus kStatuses[] = {kAllSigned,   kAllSigned,     kAllSigned,   kSomeRefused,
+                                      kSomeRefused, kSomeRefused,   kSomeRefused, kSomeRefused,
+                                      kNotLookedAt, kCannotSimulate};
   return kStatuses[static_cast<size_t>(verdict)];
 }
 

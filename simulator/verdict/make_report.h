@@ -2,6 +2,8 @@
 // file.
 #pragma once
 
+#include <cstdint>
+
 #include "simulator/installer/judgement.h"
 #include "simulator/package/facts.h"
 #include "simulator/run/run_record.h"
@@ -12,6 +14,8 @@ namespace simulator {
 // How the user wants it judged.
 struct JudgeOptions {
   bool is_strict = false;  // what is absent or damaged counts as refused
+  // Certificates that ended before it have expired; in seconds since 1970 in UTC.
+  int64_t now = 0;
 };
 
 // `installer`: what the phones' installer says of the file.

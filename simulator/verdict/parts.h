@@ -37,9 +37,10 @@ void AddInstallerItem(const Judgement& judgement, const JudgeOptions& options,
 bool IsJarSigner(const PublicKey& key, const Report& report);
 
 // Facts that matter to the user although they change nothing for the kernel. Of the report the
-// items, the signers and the key are filled. A fact of the file's own item is not told twice.
+// items, the signers and the key are filled. A fact of the file's own item is not told twice. `now`
+// is that of JudgeOptions.
 std::vector<Reason> FindWarnings(const RunRecord& run, const PackageFacts& facts,
-                                 const Report& report);
+                                 const Report& report, int64_t now = 0);
 
 // What a package's signature protects, by bytes. `items` are the report's, the package's own first.
 Protection FindProtection(const PackageFacts& facts, const std::vector<Item>& items);

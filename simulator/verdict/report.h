@@ -9,7 +9,7 @@
 
 #include "simulator/installer/judgement.h"
 #include "simulator/package/facts.h"
-#include "simulator/run/events.h"
+#include "simulator/run/run_record.h"
 #include "simulator/verdict/causes.h"
 #include "simulator/verdict/exit_status.h"
 
@@ -21,13 +21,25 @@ enum class Verdict {
   kTrustedJar,
   kPartlySigned,
   kNotInstallable,  // something was signed, and phones do not install it
+  kNotAccepted,     // all was signed, and it is not what the command line demands
   kRefused,
   kNotTrustedJar,
   kNotLookedAt,
   kNotSimulated,
 };
 
-enum class ItemKind { kPackage, kJar, kFile, kEntries, kLibrary, kKey, kTool, kInstaller };
+enum class ItemKind {
+  kPackage,
+  kJar,
+  kFile,
+  kEntries,
+  kLibrary,
+  kKey,
+  kTool,
+  kInstaller,
+  kSigner,
+  kWarnings
+};
 
 // Signed or registered; should have been and was not; a library that does not lie beside the
 // package, which is refused where the user is strict; nothing to sign.
@@ -103,6 +115,7 @@ struct Report {
   Protection protection;
   uint64_t file_size = 0;
   std::string file_sha256;  // in lower-case hexadecimal; empty: not known
+  ToolIdentity tool;
   std::vector<Link> chain;  // empty for what is no package
 
   Events events;  // all that happened, in order

@@ -1,5 +1,6 @@
 // What is worth a second look.
 #include <algorithm>
+#include <ctime>
 
 #include "simulator/verdict/parts.h"
 #include "simulator/verdict/wording.h"
@@ -12,6 +13,8 @@ using Reasons = std::vector<Reason>;
 
 void WarnOfTwoFaces(const PackageFacts& facts, const Report& report, Reasons* warnings);
 void WarnOfSigners(const PackageFacts& facts, const Report& report, Reasons* warnings);
+void WarnOfWeakDigests(const PackageFacts& facts, Reasons* warnings);
+void WarnOfExpiry(const JarSignatureFacts& jar, int64_t now, Reasons* warnings);
 void WarnOfOtherKeys(const PackageFacts& facts, const Report& report, Reasons* warnings);
 void WarnOfStrippedSchemes(const PackageFacts& facts, Reasons* warnings);
 void WarnOfEntries(const PackageFacts& facts, const Report& report, Reasons* warnings);
@@ -20,13 +23,15 @@ bool IsSaid(const std::string& entry, const Report& report);
 }  // namespace
 
 std::vector<Reason> FindWarnings(const RunRecord& run, const PackageFacts& facts,
-                                 const Report& report) {
+                                 const Report& report, int64_t now) {
   Reasons warnings;
   const bool is_package = report.items[0].kind == ItemKind::kPackage;
   if (facts.was_changed) warnings.push_back({&cause::kFileChanged, ""});
   if (is_package) {
     WarnOfTwoFaces(facts, report, &warnings);
     WarnOfSigners(facts, report, &warnings);
+    WarnOfWeakDigests(facts, &warnings);
+    WarnOfExpiry(facts.jar, now, &warnings);
     WarnOfOtherKeys(facts, report, &warnings);
     WarnOfStrippedSchemes(facts, &warnings);
   }
@@ -85,6 +90,39 @@ void WarnOfSigners(const PackageFacts& facts, const Report& report, Reasons* war
   if (jar.signature_files.size() > 1 || jar.block.signer_count > 1) {
     warnings->push_back({&cause::kSeveralSigners, jar.signature_files[0]});
   }
+}
+
+// Wherever a digest of the JAR signature is one of those for which collisions are known.
+void WarnOfWeakDigests(const PackageFacts& facts, Reasons* warnings) {
+  const auto is_weak = [](const std::string& name) {
+    return name.compare(0, 4, "SHA1") == 0 || name.compare(0, 3, "MD5") == 0;
+  };
+  const JarSignatureFacts& jar = facts.jar;
+  std::vector<std::string> uses;
+  if (jar.certificate && is_weak(jar.certificate->signature_algorithm)) {
+    uses.push_back("the certificate is signed with " + jar.certificate->signature_algorithm);
+  }
+  if (is_weak(jar.block.digest))
+    uses.push_back("the signature block is made with " + jar.block.digest);
+  if (jar.has_sha1_of_manifest)
+    uses.emplace_back("the signature file has the manifest's SHA-1 digest");
+  const auto count = std::count_if(facts.entries.begin(), facts.entries.end(),
+                                   [](const ListedEntry& each) { return each.has_sha1; });
+  if (count > 0) {
+    const std::string entries = Counted(static_cast<uint64_t>(count), "entry", "entries");
+    uses.push_back("the manifest has SHA-1 digests of " + entries);
+  }
+  if (!uses.empty()) warnings->push_back({&cause::kWeakDigest, Joined(uses)});
+}
+
+void WarnOfExpiry(const JarSignatureFacts& jar, int64_t now, Reasons* warnings) {
+  if (!jar.certificate || !jar.certificate->not_after) return;
+  if (*jar.certificate->not_after >= now) return;
+  const time_t end = *jar.certificate->not_after;
+  struct tm parts = {};
+  char text[80] = "";
+  if (gmtime_r(&end, &parts) != nullptr) strftime(text, sizeof(text), "%F %T UTC", &parts);
+  warnings->push_back({&cause::kCertificateExpired, text});
 }
 
 // One warning for a scheme that has another signer than the JAR signature.

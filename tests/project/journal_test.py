@@ -47,6 +47,7 @@ def runs(package, folder):
     alone = folder / "alone.apk"
     shutil.copy(package, alone)
     yield ["--strict", alone]
+    yield ["--signer", "0" * 64, alone]
     yield [damaged]
     yield [odd_name]
 

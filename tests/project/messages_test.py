@@ -64,10 +64,11 @@ GROUPS = {"kNotLookedAt": "The tool did not look at the file",
           "kSimulation": "The simulation could not tell", "kFile": "What the file is",
           "kSignature": "A package's signature", "kKernel": "The kernel", "kLibrary": "A library",
           "kKey": "The key", "kTool": "The tool itself",
-          "kInstaller": "The installer of the phones", "kWarning": "Warnings"}
+          "kInstaller": "The installer of the phones",
+          "kGate": "The gate: what the command line demands", "kWarning": "Warnings"}
 
 # Causes that leave the chain from the key to the entries whole: all others have to break it.
-UNBROKEN = {"kKernel", "kKey", "kInstaller", "kWarning"}
+UNBROKEN = {"kKernel", "kKey", "kInstaller", "kGate", "kWarning"}
 
 PAGE = ROOT / "docs/messages.md"
 REASONS = re.compile(r"(?<=\n)%s:\n.*" % GROUPS["kNotLookedAt"], re.S)

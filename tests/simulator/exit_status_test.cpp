@@ -300,6 +300,53 @@ TEST(ExitStatus, TwoWhenPageAndJournalAreOneFile) {
   EXPECT_EQ(access(file.c_str(), F_OK), -1);
 }
 
+TEST(ExitStatus, TwoWhenAReportWouldReplaceAFile) {
+  const Probe probe({"sign 3 0000"});
+  const std::string other = probe.folder().Write("other", ToBytes("<?xml version=\"1.0\"?>\n{}"));
+  const std::vector<Lines> kReports = {{"--junit", "JUnit report"}, {"--sarif", "SARIF log"}};
+  for (const Lines& report : kReports) {
+    for (const std::string& victim : {probe.path(), other}) {
+      const std::string before = ContentOf(victim);
+      const ProcessResult result = Simulated({report[0], victim, probe.path()});
+      EXPECT_EQ(result.status, 2);
+      EXPECT_EQ(result.output, "");
+      EXPECT_EQ(result.errors,
+                "apktoolkit-sim: " + report[0] + " " + victim +
+                    (victim == other ? " is there and holds no " + report[1] + " of apktoolkit-sim"
+                                     : " is a file that is to be looked at") +
+                    "; it is left alone\n");
+      EXPECT_EQ(ContentOf(victim), before);
+    }
+  }
+}
+
+TEST(ExitStatus, TwoWhenTwoOutputsAreOneFile) {
+  const Probe probe({"sign 3 0000"});
+  const std::string file = probe.folder() / "file";
+  const Lines options = {"--journal", "--html", "--junit", "--sarif"};
+  for (size_t i = 0; i < options.size(); ++i) {
+    for (size_t j = i + 1; j < options.size(); ++j) {
+      const ProcessResult result = Simulated({options[j], file, options[i], file, probe.path()});
+      EXPECT_EQ(result.status, 2);
+      EXPECT_EQ(result.errors,
+                "apktoolkit-sim: " + options[i] + " and " + options[j] + " name the same file\n");
+      EXPECT_EQ(access(file.c_str(), F_OK), -1);
+    }
+  }
+}
+
+TEST(ExitStatus, ThreeWhenAReportCannotBeWritten) {
+  const Probe probe({"sign 3 0100ab"});
+  const ProcessResult junit = Simulated({"--quiet", "--junit", "/dev/full", probe.path()});
+  EXPECT_EQ(junit.status, 3);
+  EXPECT_EQ(junit.errors,
+            "apktoolkit-sim: cannot write the JUnit report /dev/full: No space left on device\n");
+  const ProcessResult sarif = Simulated({"--quiet", "--sarif", "/nowhere/s", probe.path()});
+  EXPECT_EQ(sarif.status, 3);
+  EXPECT_EQ(sarif.errors,
+            "apktoolkit-sim: cannot write the SARIF log /nowhere/s: No such file or directory\n");
+}
+
 TEST(ExitStatus, IsTheHighestOfAllFiles) {
   const Probe good({"sign 3 0000"});
   const Probe bad({"verify 3"});

@@ -128,6 +128,39 @@ TEST(Options, ApiLevelsAreOneARangeOrAllFromOneOn) {
   EXPECT_EQ(levels("30-"), std::make_pair(30, kNewestLevel));
 }
 
+TEST(Options, SignersAreDigestsInOneForm) {
+  const std::string digest(64, 'a');
+  std::string pairs = "AA";
+  for (int i = 1; i < 32; ++i) pairs += ":aA";
+  const Options options = Parsed({"--signer", digest, "--signer=" + pairs, "a.apk", "b.apk"});
+  EXPECT_EQ(options.gate.signers, Lines({digest, digest}));
+  EXPECT_EQ(options.files, Lines({"a.apk", "b.apk"}));
+  EXPECT_EQ(Parsed({"a.apk"}).gate.signers, Lines());
+}
+
+TEST(Options, OfTheGateAndItsReports) {
+  EXPECT_FALSE(Parsed({"a.apk"}).gate.refuses_warnings);
+  EXPECT_TRUE(Parsed({"--werror", "a.apk"}).gate.refuses_warnings);
+  const Options options = Parsed({"--junit", "j", "--sarif", "s", "a.apk"});
+  EXPECT_EQ(options.show.junit, "j");
+  EXPECT_EQ(options.show.sarif, "s");
+}
+
+TEST(Options, JournalOnStandardOutputIsJson) {
+  const Options options = Parsed({"--journal", "-", "a.apk"});
+  EXPECT_TRUE(options.show.json);
+  EXPECT_EQ(options.show.journal, "");
+  EXPECT_TRUE(Parsed({"--journal=-", "--json", "a.apk"}).show.json);
+  const Options file = Parsed({"--journal", "./-", "a.apk"});
+  EXPECT_FALSE(file.show.json);
+  EXPECT_EQ(file.show.journal, "./-");
+}
+
+TEST(Options, OwnToolIsTheOneBesideTheSimulator) {
+  EXPECT_TRUE(Parsed({"a.apk"}).run.is_own_tool);
+  EXPECT_FALSE(Parsed({"--tool", "t", "a.apk"}).run.is_own_tool);
+}
+
 TEST(Options, MistakesAreReportedWithStatusTwo) {
   const std::vector<Lines> mistakes = {{},
                                        {"--nonsense", "a.apk"},
@@ -147,6 +180,14 @@ TEST(Options, MistakesAreReportedWithStatusTwo) {
                                        {"--api", "27-30-33", "a.apk"},
                                        {"--api=-30", "a.apk"},
                                        {"--api", "99999999999", "a.apk"},
+                                       {"--signer", "", "a.apk"},
+                                       {"--signer", "a.apk"},
+                                       {"--signer", std::string(63, 'a'), "a.apk"},
+                                       {"--signer", std::string(64, 'g'), "a.apk"},
+                                       {"--verify", "--werror", "a.apk"},
+                                       {"--verify", "--signer", std::string(64, 'a'), "a.apk"},
+                                       {"--verify", "--junit", "/nowhere/j", "a.apk"},
+                                       {"--verify", "--sarif", "/nowhere/s", "a.apk"},
                                        {"--timeout", "0", "a.apk"},
                                        {"--timeout", "-1", "a.apk"},
                                        {"--timeout", "nan", "a.apk"},
@@ -191,7 +232,11 @@ TEST(Options, HelpNamesEveryOptionAndStatus) {
                            "--strict ",
                            "--quiet ",
                            "--verbose ",
+                           "--signer SHA256",
+                           "--werror ",
                            "--journal FILE",
+                           "--junit FILE",
+                           "--sarif FILE",
                            "--html FILE",
                            "--json ",
                            "--jobs N",

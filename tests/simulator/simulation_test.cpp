@@ -242,6 +242,56 @@ TEST(Page, OfAnInterruptedRunHasWhatWasDone) {
   EXPECT_NE(text.find("</html>\n"), std::string::npos);
 }
 
+// Each file has its case and its error, and the last two were never begun.
+TEST(Reports, OfAnInterruptedRunAreWholeAndNotGreen) {
+  const Probe good({"sign 3 0000"});
+  const Probe slow({"sign 3 0000", "pid", "sleep 60"});
+  const std::string junit = good.folder() / "junit.xml", sarif = good.folder() / "log.sarif";
+  const Interrupted run(slow.path() + ".pid",
+                        {SimulatorPath(), "--tool", PROBE_PATH, "--junit", junit, "--sarif", sarif,
+                         good.path(), slow.path(), "/never/1", "/never/2"});
+  EXPECT_EQ(run.ended_by, SIGTERM);
+  const std::string xml = ContentOf(junit);
+  EXPECT_NE(xml.find("tests=\"4\" failures=\"0\" errors=\"3\""), std::string::npos) << xml;
+  EXPECT_NE(xml.find("name=\"/never/2\">\n            <error type=\"interrupted\" "
+                     "message=\"NOT SIMULATED: it was interrupted\">"),
+            std::string::npos)
+      << xml;
+  EXPECT_NE(xml.find("</testsuites>\n"), std::string::npos);
+  const Json log = Json::parse(ContentOf(sarif), nullptr, false);
+  ASSERT_TRUE(log.is_object());
+  EXPECT_EQ(log["runs"][0]["artifacts"].size(), 4U);
+  EXPECT_EQ(log["runs"][0]["invocations"][0]["executionSuccessful"], false);
+  EXPECT_EQ(log["runs"][0]["invocations"][0]["toolExecutionNotifications"].size(), 3U);
+  ASSERT_EQ(log["runs"][0]["results"].size(), 3U);
+  for (const Json& result : log["runs"][0]["results"]) {
+    EXPECT_EQ(result["level"], "error");
+    EXPECT_EQ(result["ruleId"], "interrupted");
+  }
+}
+
+// An earlier green report must not outlive a run that could not begin.
+TEST(Reports, OfARunThatCannotBeginAreNotGreen) {
+  const Probe good({"sign 3 0000"});
+  const std::string junit = good.folder() / "junit.xml", sarif = good.folder() / "log.sarif";
+  const Lines reports = {"--junit", junit, "--sarif", sarif, good.path()};
+  ASSERT_EQ(Simulated(reports).status, 0);
+  EXPECT_NE(ContentOf(junit).find("failures=\"0\" errors=\"0\""), std::string::npos);
+  EXPECT_EQ(Json::parse(ContentOf(sarif))["runs"][0]["results"], Json::array());
+  Lines words = {"--tool", "/nowhere/tool"};
+  words.insert(words.end(), reports.begin(), reports.end());
+  const ProcessResult result = Told(words);
+  EXPECT_EQ(result.status, 3);
+  EXPECT_EQ(result.errors, "apktoolkit-sim: cannot run /nowhere/tool: No such file or directory\n");
+  EXPECT_NE(
+      ContentOf(junit).find("<error type=\"not-begun\" message=\"NOT SIMULATED: no file could "
+                            "be simulated: cannot run /nowhere/tool: No such file or "
+                            "directory\">"),
+      std::string::npos)
+      << ContentOf(junit);
+  EXPECT_EQ(Json::parse(ContentOf(sarif))["runs"][0]["results"][0]["ruleId"], "not-begun");
+}
+
 TEST(Simulation, FollowsLinksToTheFile) {
   const Probe probe({"sign 3 0000"});
   const std::string link = probe.folder() / "link";

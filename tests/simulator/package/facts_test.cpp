@@ -146,6 +146,16 @@ TEST(PackageFacts, ListedAreTheEntriesThatTheToolFindsADigestFor) {
             std::vector<std::string>({"a", "c"}));
 }
 
+TEST(PackageFacts, EntriesWithSha1DigestsAreThoseThatTheToolReadsSo) {
+  PackageOptions options = WithManifest(
+      "Manifest-Version: 1.0\r\n\r\nName: a\r\nSHA1-Digest: x\r\n\r\n"
+      "Name: b\r\nSHA-256-Digest: x\r\n\r\nName: c\r\nMD5-Digest: y\r\n\r\n");
+  for (const char* name : {"a", "b", "c", "d"}) options.entries.push_back({name, ToBytes("x")});
+  const PackageFacts facts = FactsOf(MakePackage(options).Build());
+  EXPECT_EQ(NamesWhere(facts, [](const auto& e) { return e.has_sha1; }),
+            std::vector<std::string>({"a"}));
+}
+
 // The digests are those of "x", as coreutils and xxd print them: printf x | sha256sum | xxd -r -p |
 // base64, and the same with sha1sum.
 TEST(PackageFacts, EachListedEntryIsComparedWithItsDigest) {

@@ -124,6 +124,28 @@ TEST(HeadFacts, HaveTheInstallersReasonWhereTheVerdictIsHis) {
   EXPECT_EQ(HeadFacts(report, "..."), Lines({"phones do not install it: why"}));
 }
 
+// Nobody who looks at the first line alone may miss that another signed.
+TEST(HeadFacts, HaveASignerWhoWasNotExpectedBesideAnyReason) {
+  Report report = WithSigner();
+  report.verdict = Verdict::kPartlySigned;
+  const Item signer = {
+      ItemKind::kSigner, "signer", "", ItemState::kRefused, {&cause::kSignerUnexpected, "who"}};
+  report.items = {Library(&cause::kLibraryMissing), signer};
+  report.items[0].state = ItemState::kRefused;
+  EXPECT_EQ(HeadFacts(report, "..."),
+            Lines({"lib/arm64/a.so: it does not lie beside the package, where others are",
+                   "its signer is none that --signer names: who"}));
+  report.verdict = Verdict::kNotAccepted;
+  report.items = {signer};
+  EXPECT_EQ(HeadFacts(report, "..."), Lines({"its signer is none that --signer names: who"}));
+  // That the signer of a refused file is not known follows from the refusal.
+  report.verdict = Verdict::kRefused;
+  report.items = {Library(&cause::kLibraryMissing), signer};
+  report.items[0].state = ItemState::kRefused;
+  report.items[1].reason = {&cause::kSignerNotVerified, "who"};
+  EXPECT_EQ(HeadFacts(report, "...").size(), 1U);
+}
+
 TEST(HeadFacts, NameTheOtherSigner) {
   Report report = WithSigner();
   report.verdict = Verdict::kOtherSigner;

@@ -284,6 +284,52 @@ TEST(Warnings, DebugCertificate) {
   EXPECT_EQ(Warnings(facts), Lines());
 }
 
+TEST(Warnings, DigestsForWhichCollisionsAreKnown) {
+  PackageFacts facts = Good();
+  facts.jar.certificate->signature_algorithm = "SHA256withRSA";
+  facts.jar.block.digest = "SHA256";
+  facts.entries = {{{"a", 1, false}, true, false, EntryDigest::kMatches, false}};
+  EXPECT_EQ(Warnings(facts), Lines());
+  for (const char* digest : {"SHA384", "SHA512", "SHA224"}) {
+    facts.jar.block.digest = digest;
+    facts.jar.certificate->signature_algorithm = std::string(digest) + "withRSA";
+    EXPECT_EQ(Warnings(facts), Lines()) << digest;
+  }
+  facts.jar.block.digest = "SHA256";
+  facts.jar.certificate->signature_algorithm = "SHA1withRSA";
+  EXPECT_EQ(Warnings(facts), Lines({"weak-digest: the certificate is signed with SHA1withRSA"}));
+  facts.jar.certificate->signature_algorithm = "SHA256withRSA";
+  facts.jar.has_sha1_of_manifest = true;
+  EXPECT_EQ(Warnings(facts),
+            Lines({"weak-digest: the signature file has the manifest's SHA-1 digest"}));
+  facts.jar.has_sha1_of_manifest = false;
+  facts.entries[0].has_sha1 = true;
+  EXPECT_EQ(Warnings(facts), Lines({"weak-digest: the manifest has SHA-1 digests of 1 entry"}));
+  facts.entries[0].has_sha1 = false;
+  facts.jar.block.digest = "MD5";
+  EXPECT_EQ(Warnings(facts), Lines({"weak-digest: the signature block is made with MD5"}));
+  facts.jar.block.digest = "SHA1";
+  facts.jar.certificate->signature_algorithm = "MD5withRSA";
+  EXPECT_EQ(Warnings(facts), Lines({"weak-digest: the certificate is signed with MD5withRSA, the "
+                                    "signature block is made with SHA1"}));
+}
+
+// date -u -d @1000000000: 2001-09-09 01:46:40. The second that a certificate names is its last.
+TEST(Warnings, CertificateThatExpired) {
+  const auto told = [](std::optional<int64_t> end, int64_t now) {
+    PackageFacts facts = Good();
+    facts.jar.certificate->not_after = end;
+    Lines codes;
+    for (const Reason& each : FindWarnings({}, facts, ReportOf(facts), now)) {
+      codes.push_back(std::string(each.cause->code) + ": " + each.detail);
+    }
+    return codes;
+  };
+  EXPECT_EQ(told(1000000000, 1000000001), Lines({"certificate-expired: 2001-09-09 01:46:40 UTC"}));
+  EXPECT_EQ(told(1000000000, 1000000000), Lines());
+  EXPECT_EQ(told({}, 1000000001), Lines());
+}
+
 TEST(Warnings, EncryptedEntriesAreNotCalledDamaged) {
   PackageFacts facts = Good();
   facts.entries = {{{"secret", 1, true, true}, true, false, EntryDigest::kNotCompared}};
