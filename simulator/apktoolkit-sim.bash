@@ -36,6 +36,10 @@ _apktoolkit_sim() {
       compopt -o filenames
       mapfile -t COMPREPLY < <(compgen -d -- "$word")
       ;;
+    --files-from)
+      compopt -o filenames
+      mapfile -t COMPREPLY < <(compgen -f -- "$word")
+      ;;
     --runner | --tool)
       compopt -o filenames
       mapfile -t COMPREPLY < <(compgen -c -- "$word" && compgen -f -- "$word")
@@ -44,8 +48,8 @@ _apktoolkit_sim() {
     *)
       if [[ $word == -* ]]; then
         mapfile -t COMPREPLY < <(
-          compgen -W "--api --help --html --install --installer --integrity --jobs --journal
-            --json --quiet --runner --sign-errno --state --strict --timeout --tool --trust
+          compgen -W "--api --files-from --help --html --install --installer --integrity --jobs --journal
+            --json --null --quiet --recursive --runner --sign-errno --state --strict --timeout --tool --trust
             --verbose --verify
             --verify-errno --version --zu-result" -- "$word"
         )

@@ -45,6 +45,7 @@ constexpr struct {
 std::vector<std::string> CommandLineOf(int argc, char** argv);
 void AddPhone(CLI::App* app, Options* options);
 void AddKernelAnswer(CLI::App* app, const char* name, int* error, const char* description);
+void AddFiles(CLI::App* app, Options* options);
 void AddInstallation(CLI::App* app, Options* options);
 void AddInstaller(CLI::App* app, Options* options);
 void AddOutput(CLI::App* app, Options* options);
@@ -53,6 +54,7 @@ void AddVerify(CLI::App* app, Options* options);
 bool ReadLevels(const std::string& text, LevelRange* levels);
 int ErrorNumber(const std::string& name);
 std::optional<int> NameUnknownOption(const CLI::App& app);
+int MissFile();
 
 }  // namespace
 
@@ -64,12 +66,11 @@ std::optional<int> ParseOptions(int argc, char** argv, Options* options) {
   options->installer.program = ProgramDirectory() + "/../lib/apktoolkit/installer.jar";
   std::string runner;
 
-  app.add_option("FILE", options->files, "Packages, JARs or other files")
-      ->type_name("")
-      ->required();
+  app.add_option("FILE", options->files.names, "Packages, JARs or other files")->type_name("");
   app.option_defaults()->group("The phone");
   AddPhone(&app, options);
   app.option_defaults()->group("The run");
+  AddFiles(&app, options);
   AddInstallation(&app, options);
   AddInstaller(&app, options);
   AddOutput(&app, options);
@@ -79,10 +80,6 @@ std::optional<int> ParseOptions(int argc, char** argv, Options* options) {
   app.set_version_flag("--version", "apktoolkit-sim " APKTOOLKIT_VERSION, "Print the version");
   try {
     app.parse(CommandLineOf(argc, argv));
-  } catch (const CLI::RequiredError& error) {
-    if (const auto status = NameUnknownOption(app)) return status;
-    app.exit(error);
-    return kUsageError;
   } catch (const CLI::ParseError& error) {
     return app.exit(error) == 0 ? 0 : kUsageError;
   }
@@ -95,7 +92,9 @@ std::optional<int> ParseOptions(int argc, char** argv, Options* options) {
     options->run.tool =
         ProgramDirectory() + (options->verify ? "/apktoolkit-verify" : "/apktoolkit");
   }
-  return NameUnknownOption(app);
+  if (const auto status = NameUnknownOption(app)) return status;
+  if (options->files.names.empty() && options->files.list.empty()) return MissFile();
+  return {};
 }
 
 namespace {
@@ -143,6 +142,23 @@ void AddKernelAnswer(CLI::App* app, const char* name, int* error, const char* de
   };
   const auto set = [error](const std::string& text) { *error = ErrorNumber(text); };
   app->add_option_function<std::string>(name, set, description)->type_name("NAME")->check(check);
+}
+
+void AddFiles(CLI::App* app, Options* options) {
+  FileListOptions* const files = &options->files;
+  app->add_flag("--recursive", files->is_recursive,
+                "A directory stands for the packages in and\n"
+                "below it: .apk .jar .apks .xapk .apkm .aab");
+  const auto is_name = [](const std::string& name) {
+    return name.empty() ? "the name is empty" : std::string();
+  };
+  CLI::Option* const list = app->add_option("--files-from", files->list,
+                                            "Read more FILEs from a list, one a line;\n"
+                                            "\"-\" is standard input")
+                                ->type_name("LIST")
+                                ->check(is_name);
+  app->add_flag("-0,--null", files->has_nul, "The names of the list end with NUL bytes")
+      ->needs(list);
 }
 
 void AddInstallation(CLI::App* app, Options* options) {
@@ -251,7 +267,7 @@ void AddVerify(CLI::App* app, Options* options) {
                                             "Sign nothing: ask the kernel which FILEs it\n"
                                             "trusts, by the apktoolkit-verify beside this\n"
                                             "program");
-  for (const char* name : {kInstall, "--strict", "--quiet", "--verbose", "--html"}) {
+  for (const char* name : {kInstall, "--strict", "--recursive", "--quiet", "--verbose", "--html"}) {
     verify->excludes(app->get_option(name));
   }
 }
@@ -264,6 +280,11 @@ std::optional<int> NameUnknownOption(const CLI::App& app) {
   const std::string word = Printable(unknown[0], {});
   std::cerr << "there is no option " << word << " (a file of that name: ./" << word
             << ")\nRun with --help for more information.\n";
+  return kUsageError;
+}
+
+int MissFile() {
+  std::cerr << "FILE is required, or --files-from\nRun with --help for more information.\n";
   return kUsageError;
 }
 

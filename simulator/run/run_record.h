@@ -76,6 +76,7 @@ struct RunRecord {
   // What the simulator itself knows of the run.
   Failure failure;
   bool has_standard_input = true;  // the tool was started with one
+  bool has_no_packages = false;    // a directory that was walked for them; the tool was not run
   // The library entries that --install does not take for their names, and those that it could not
   // extract.
   bool was_laid_out = false;  // --install was given

@@ -43,6 +43,18 @@ std::string OwnDescriptorPath(int fd) {
   return "/proc/" + std::to_string(getpid()) + "/fd/" + std::to_string(fd);
 }
 
+// A directory for which the tool is not run: all that can be told is why.
+FileRun RunOfDirectory(const ListedFile& directory) {
+  FileRun run;
+  const std::string path = Resolved(directory.name);
+  run.journal = Event("start").Text("file", directory.name).Text("path", path).Line();
+  run.record = TakeApart(ParseEvents(run.journal));
+  run.record.has_no_packages = directory.state == ListedFile::State::kWithoutPackages;
+  run.facts.kind = FileKind::kDirectory;
+  run.facts.error = directory.error;
+  return run;
+}
+
 std::string ContentOf(int fd) {
   struct stat state = {};
   fstat(fd, &state);
@@ -73,7 +85,9 @@ std::optional<std::string> Simulator::Prepare() {
   return {};
 }
 
-FileRun Simulator::Run(const std::string& file) {
+FileRun Simulator::Run(const ListedFile& listed) {
+  if (listed.state != ListedFile::State::kToRun) return RunOfDirectory(listed);
+  const std::string& file = listed.name;
   Task task = {Deadline(options_.timeout), ScopedFd(memfd_create("journal", MFD_CLOEXEC)), "", {}};
   if (task.journal.get() >= 0) fcntl(task.journal.get(), F_SETFL, O_APPEND);
   Installation installation;

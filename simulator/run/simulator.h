@@ -8,6 +8,7 @@
 
 #include "simulator/package/facts.h"
 #include "simulator/phone/settings.h"
+#include "simulator/run/file_list.h"
 #include "simulator/run/installation.h"
 #include "simulator/run/run_record.h"
 #include "simulator/run/signed_bytes.h"
@@ -42,9 +43,9 @@ class Simulator {
   // else why it cannot.
   std::optional<std::string> Prepare();
 
-  // Runs the tool for `file`. May be called from several threads when the options have several
-  // jobs.
-  FileRun Run(const std::string& file);
+  // Runs the tool for `file`, unless that is a directory with nothing to run it for. May be called
+  // from several threads when the options have several jobs.
+  FileRun Run(const ListedFile& file);
 
  private:
   // One run on its way: what it needs, and why it failed.

@@ -71,6 +71,10 @@ inline constexpr Cause kStandardInputClosed = {"standard-input-closed", Group::k
 inline constexpr Cause kFileLeased = {"file-leased", Group::kNotLookedAt, Severity::kUnseen,
     ChainLink::kKey, "", "another process holds a lease on it",
     "Have that process close the file, and run again; /proc/locks names it by its number."};
+inline constexpr Cause kNoPackages = {"no-packages", Group::kNotLookedAt, Severity::kUnseen,
+    ChainLink::kKey, "", "it is a directory, and no file in it or below it has a package's name",
+    "--recursive takes .apk, .jar, .apks, .xapk, .apkm and .aab. Name other files one by one, or "
+    "with --files-from."};
 
 // ---- The simulation could not tell.
 inline constexpr Cause kToolNotStarted = {"tool-not-started", Group::kSimulation, Severity::kFailed,
@@ -96,7 +100,11 @@ inline constexpr Cause kInterrupted = {"interrupted", Group::kSimulation, Severi
 
 // ---- What the file is.
 inline constexpr Cause kFolder = {"folder", Group::kFile, Severity::kRefused, ChainLink::kKey,
-    "`OpenArchiveFd(`", "it is a folder", "Name the package inside it, such as base.apk."};
+    "`OpenArchiveFd(`", "it is a directory",
+    "Name the package inside it, or give --recursive."};
+inline constexpr Cause kPackageDirectory = {"package-directory", Group::kFile, Severity::kRefused,
+    ChainLink::kKey, "`OpenArchiveFd(`", "it is a directory with %s in it",
+    "Name them all, a base and its splits: DIRECTORY/*.apk; or give --recursive."};
 inline constexpr Cause kSpecialFile = {"special-file", Group::kFile, Severity::kRefused,
     ChainLink::kKey, "`OpenArchiveFd(`", "it is a device, a pipe or a socket", "Name a file."};
 inline constexpr Cause kEmptyFile = {"empty-file", Group::kFile, Severity::kRefused,

@@ -36,7 +36,7 @@ Report MakeReport(const RunRecord& run, const PackageFacts& facts, const JudgeOp
   report.file_sha256 = facts.sha256;
   Reason failure = WhyFailed(run.failure);
   if (failure.cause == nullptr && run.is_silent && !run.signal) {
-    const Reason unseen = WhyNotLookedAt(facts, run.has_standard_input);
+    const Reason unseen = WhyNotLookedAt(run, facts);
     if (run.status != 0) {
       failure = {&cause::kToolFailed, std::to_string(run.status)};
     } else if (unseen.cause == nullptr) {

@@ -190,8 +190,8 @@ TEST_F(Reason, ExponentOfOne) {
 
 TEST_F(Reason, Folder) {
   EXPECT_EQ(Told(3, {}, "."),
-            Lines({"REFUSED  .", "  ✗ file  not signed: it is a folder",
-                   "      Name the package inside it, such as base.apk.", "-> 1"}));
+            Lines({"REFUSED  .", "  ✗ file  not signed: it is a directory",
+                   "      Name the package inside it, or give --recursive.", "-> 1"}));
 }
 
 TEST_F(Reason, EmptyFile) {
@@ -365,6 +365,7 @@ TEST_F(Reason, EncryptedEntry) {
 TEST_F(Reason, ArchivesThatAreNoPackage) {
   Take("apksigner-sha256-2048");
   Do("touch BundleConfig.pb; zip -q app.aab BundleConfig.pb; zip -q set.apks base.apk;"
+     "echo '{}' >manifest.json; zip -q set.xapk manifest.json base.apk;"
      "zip -q -d base.apk AndroidManifest.xml");
   EXPECT_EQ(
       Told(3, {}, "app.aab"),
@@ -377,6 +378,11 @@ TEST_F(Reason, ArchivesThatAreNoPackage) {
              "  ✗ JAR  not signed: it is an archive of packages (.apks, .xapk), and no "
              "package itself",
              "      Unpack it, and name the packages in it, the base and its splits.", "-> 1"}));
+  EXPECT_EQ(Told(2, {}, "set.xapk"),
+            Lines({"REFUSED  set.xapk",
+                   "  ✗ JAR  not signed: it is an archive of packages (.apks, .xapk), and no "
+                   "package itself",
+                   "-> 1"}));
   EXPECT_EQ(Told(2)[1].substr(0, 50), "  ✗ JAR  not signed: it has parts of a package (");
 }
 
