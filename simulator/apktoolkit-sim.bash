@@ -24,7 +24,7 @@ _apktoolkit_sim() {
       mapfile -t COMPREPLY < <(compgen -W "0 65540 -1" -- "$word")
       ;;
     --install)
-      mapfile -t COMPREPLY < <(compgen -W "phone all arm64 arm" -- "$word")
+      mapfile -t COMPREPLY < <(compgen -W "phone all arm64 arm no" -- "$word")
       ;;
     --installer)
       mapfile -t COMPREPLY < <(compgen -W "auto required off" -- "$word")

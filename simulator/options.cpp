@@ -34,6 +34,7 @@ constexpr struct {
                       {"off", InstallerUse::kOff}};
 
 constexpr char kInstall[] = "--install";
+constexpr char kInstallNo[] = "no";
 constexpr struct {
   const char* name;
   InstalledAbi abi;
@@ -80,11 +81,17 @@ std::optional<int> ParseOptions(int argc, char** argv, Options* options) {
   app.set_version_flag("--version", "apktoolkit-sim " APKTOOLKIT_VERSION, "Print the version");
   try {
     app.parse(CommandLineOf(argc, argv));
+    if (options->verify && options->run.install == InstallWhen::kAlways) {
+      throw CLI::ExcludesError("--verify", kInstall);
+    }
   } catch (const CLI::ParseError& error) {
     return app.exit(error) == 0 ? 0 : kUsageError;
   }
   options->installer.timeout = options->run.timeout;
-  if (options->verify) options->installer.use = InstallerUse::kOff;
+  if (options->verify) {
+    options->installer.use = InstallerUse::kOff;
+    options->run.install = InstallWhen::kNever;
+  }
   for (const std::string& word : Split(runner, ' ')) {
     if (!word.empty()) options->run.runner.push_back(word);
   }
@@ -163,21 +170,25 @@ void AddFiles(CLI::App* app, Options* options) {
 
 void AddInstallation(CLI::App* app, Options* options) {
   const auto install = [options](const std::string& name) {
+    options->run.install = name == kInstallNo ? InstallWhen::kNever : InstallWhen::kAlways;
     for (const auto& abi : kAbis) {
       if (name == abi.name) options->run.abi = abi.abi;
     }
   };
   const auto check = [](const std::string& name) {
-    const bool is_known = std::any_of(std::begin(kAbis), std::end(kAbis),
-                                      [&name](const auto& abi) { return name == abi.name; });
-    return is_known ? std::string() : "there are phone, all, arm64 and arm, and no " + name;
+    const bool is_known =
+        name == kInstallNo || std::any_of(std::begin(kAbis), std::end(kAbis),
+                                          [&name](const auto& abi) { return name == abi.name; });
+    return is_known ? std::string() : "there are phone, all, arm64, arm and no, and no " + name;
   };
   app->add_option_function<std::string>(kInstall, install,
                                         "Lay the libraries out first, as an installer\n"
-                                        "does, in a folder of their own: for phone, all,\n"
-                                        "arm64 or arm [default: phone]")
+                                        "does, in a directory of their own: for phone,\n"
+                                        "all, arm64 or arm; \"no\" never does that\n"
+                                        "[default: phone, if a package lies alone]")
       ->type_name("[=ABI]")
-      ->check(check);
+      ->check(check)
+      ->take_last();
   app->add_flag("--strict", options->judge.is_strict,
                 "A library that does not lie beside its package\n"
                 "counts as refused");
@@ -267,7 +278,7 @@ void AddVerify(CLI::App* app, Options* options) {
                                             "Sign nothing: ask the kernel which FILEs it\n"
                                             "trusts, by the apktoolkit-verify beside this\n"
                                             "program");
-  for (const char* name : {kInstall, "--strict", "--recursive", "--quiet", "--verbose", "--html"}) {
+  for (const char* name : {"--strict", "--recursive", "--quiet", "--verbose", "--html"}) {
     verify->excludes(app->get_option(name));
   }
 }

@@ -91,25 +91,26 @@ FileRun Simulator::Run(const ListedFile& listed) {
   Task task = {Deadline(options_.timeout), ScopedFd(memfd_create("journal", MFD_CLOEXEC)), "", {}};
   if (task.journal.get() >= 0) fcntl(task.journal.get(), F_SETFL, O_APPEND);
   Installation installation;
-  std::string installed = file;
-  if (options_.abi) {
-    const auto problem = installation.LayOut(file, *options_.abi, task.deadline);
-    if (problem) Fail(Failure::Kind::kNotInstalled, *problem, &task);
-    installed = installation.path();
-  }
+  const auto problem = installation.LayOut(file, options_.install, options_.abi, task.deadline);
+  if (problem) Fail(Failure::Kind::kNotInstalled, *problem, &task);
+  const std::string& installed = installation.path();
   struct stat before = {};
   const bool is_there = stat(installed.c_str(), &before) == 0 && S_ISREG(before.st_mode);
   task.path = Resolved(installed);
-  Event("start").Text("file", file).Text("path", task.path).AppendTo(task.journal.get());
+  Event start("start");
+  start.Text("file", file).Text("path", Resolved(file));
+  if (installation.is_done()) start.Text("installed", task.path);
+  start.AppendTo(task.journal.get());
   if (task.failure.kind == Failure::Kind::kNone) RunToolFor(installed, &task);
 
   FileRun run;
-  run.journal = ContentOf(task.journal.get());
+  const std::string journal = ContentOf(task.journal.get());
+  RememberSigned(ParseEvents(journal), &task);
+  run.journal = installation.WithStablePaths(journal);
   run.record = TakeApart(ParseEvents(run.journal));
-  RememberSigned(run.record.events, &task);
   run.record.failure = task.failure;
   run.record.has_standard_input = has_standard_input_;
-  run.record.was_laid_out = options_.abi.has_value();
+  run.record.of_other_processors = installation.of_other_processors();
   run.record.not_laid_out = installation.left_out();
   run.record.not_extracted = installation.not_extracted();
   // What cannot be judged is not looked at.

@@ -18,14 +18,15 @@ namespace simulator {
 
 // What the phone is like, and how the tool is run in it.
 struct RunOptions {
-  PhoneSettings phone;              // all but its journal and its trusted files
-  std::vector<std::string> trust;   // existing files that the kernel trusts
-  std::string state;                // the directory that remembers what was signed; may be empty
-  std::optional<InstalledAbi> abi;  // whose libraries are laid out; none: the file stays as it lies
-  unsigned jobs = 1;                // how many files at a time
-  std::string tool;                 // the program that is run
-  std::vector<std::string> runner;  // words before the tool, such as an emulator's
-  double timeout = 30;              // seconds, for each file
+  PhoneSettings phone;             // all but its journal and its trusted files
+  std::vector<std::string> trust;  // existing files that the kernel trusts
+  std::string state;               // the directory that remembers what was signed; may be empty
+  InstallWhen install = InstallWhen::kAlone;
+  InstalledAbi abi = InstalledAbi::kPreferred;  // whose libraries are laid out
+  unsigned jobs = 1;                            // how many files at a time
+  std::string tool;                             // the program that is run
+  std::vector<std::string> runner;              // words before the tool, such as an emulator's
+  double timeout = 30;                          // seconds, for each file
 };
 
 // What one run gave to judge by.

@@ -323,11 +323,11 @@ inline constexpr Cause kLibraryInPackage = {"library-in-package", Group::kLibrar
 inline constexpr Cause kLibraryNotInstalled = {"library-not-installed", Group::kLibrary,
     Severity::kAbsent, ChainLink::kNone, "`Can't open file`",
     "no libraries for its processor lie beside the package", "Nothing, where the phone is of "
-    "another kind. For a package that lies alone: --install; for all processors: --install=all."};
+    "another kind. To lay out those of all processors: --install=all."};
 inline constexpr Cause kLibraryNotLaidOut = {"library-not-laid-out", Group::kLibrary,
-    Severity::kAbsent, ChainLink::kNone, "`Can't open file`",
-    "--install lays out no libraries for its processor",
-    "Nothing, where the phone is of another kind. For all processors: --install=all."};
+    Severity::kNothing, ChainLink::kNone, "`Can't open file`",
+    "it is for another processor than the phone's (--install=all lays out those of all)",
+    "Nothing: phones install the libraries of one processor."};
 inline constexpr Cause kLibraryInSubdirectory = {"library-in-subdirectory", Group::kLibrary,
     Severity::kAbsent, ChainLink::kNone, "`Can't open file`",
     "it is in a subdirectory of its ABI: the tool looks for %s, and installers do not put it there",
@@ -347,7 +347,7 @@ inline constexpr Cause kLibraryLeased = {"library-leased", Group::kLibrary, Seve
     ChainLink::kNone, "`Can't open file`", "another process holds a lease on it",
     "Have that process close the file, and run again; /proc/locks names it by its number."};
 inline constexpr Cause kLibraryNotExtracted = {"library-not-extracted", Group::kLibrary,
-    Severity::kRefused, ChainLink::kEntries, "", "--install cannot extract it from the package",
+    Severity::kRefused, ChainLink::kEntries, "", "it cannot be extracted from the package",
     "Copy or build the package again; unzip -t names the fault."};
 inline constexpr Cause kLibraryBehindDamage = {"library-behind-damage", Group::kLibrary,
     Severity::kRefused, ChainLink::kNone, "",
@@ -425,8 +425,8 @@ inline constexpr Cause kUnlistedEntries = {"unlisted-entries", Group::kWarning, 
     ChainLink::kNone, "", "the signature does not protect %s: no digest in the manifest",
     "Sign the package again, as the last step that changes it; --verbose lists them."};
 inline constexpr Cause kNotLaidOut = {"not-laid-out", Group::kWarning, Severity::kWarning,
-    ChainLink::kNone, "", "--install leaves out %s",
-    "An installer takes files of the form lib/ABI/NAME that can be extracted."};
+    ChainLink::kNone, "", "an installer leaves out %s",
+    "Build the package again with its libraries as lib/ABI/NAME."};
 inline constexpr Cause kCertificateOtherKey = {"certificate-other-key", Group::kWarning,
     Severity::kAlarm, ChainLink::kNone, "",
     "its certificate shows another key than the tool reads: %s", "Do not trust this package, if it "

@@ -30,6 +30,7 @@ Report MakeReport(const RunRecord& run, const PackageFacts& facts, const JudgeOp
   Report report;
   report.file = run.file;
   report.path = run.path;
+  report.installed = run.installed;
   report.events = run.events;
   report.installer = installer;
   report.file_size = facts.size;

@@ -118,6 +118,39 @@ TEST_F(ManyFiles, ListThatNamesNothingIsNoSuccess) {
                    "directory\n"}));
 }
 
+// The directory in which a package is laid out is called otherwise each time, and nobody sees it.
+TEST_F(ManyFiles, TwoRunsOverTheSameFileTellTheSame) {
+  const std::string both =
+      "for run in 1 2; do sim --journal $run.journal --html $run.html good/base.apk; "
+      "\"$SIM\" --installer=off --verbose good/base.apk >$run.text; "
+      "sed -i 's/\"pid\":[1-9][0-9]*/\"pid\":N/' $run.journal; done\n";
+  const ProcessResult run =
+      Do(both + "cmp 1.journal 2.journal && cmp 1.html 2.html && cmp 1.text 2.text");
+  EXPECT_EQ(run.status, 0) << run.output << run.errors;
+  const std::string journal = ContentOf(folder_ / "1.journal");
+  EXPECT_NE(journal.find("{\"event\":\"start\",\"file\":\"good/base.apk\",\"path\":\"" +
+                         folder_.path() + "/good/base.apk\",\"installed\":\"<install>/base.apk\"}"),
+            std::string::npos)
+      << journal;
+  EXPECT_NE(journal.find("\"path\":\"<install>/lib/arm64/libvault.so\""), std::string::npos);
+  for (const char* file : {"1.journal", "1.html", "1.text"}) {
+    const std::string content = ContentOf(folder_ / file);
+    EXPECT_EQ(content.find("apktoolkit-sim."), std::string::npos) << file;
+    EXPECT_NE(content.find("lib/arm64/libvault.so"), std::string::npos) << file;
+  }
+}
+
+// A name with the placeholder in it is told as it is: no path of a file's begins so.
+TEST_F(ManyFiles, NameThatLooksLikeAnInstallationIsTold) {
+  const ProcessResult run =
+      Do("mkdir '<install>'; cp good/base.apk '<install>'/; sim --journal journal "
+         "'<install>'/base.apk");
+  EXPECT_EQ(Told(run), Lines({"SIGNED  <install>/base.apk", "-> 0"}));
+  EXPECT_NE(ContentOf(folder_ / "journal")
+                .find("\"path\":\"" + folder_.path() + "/<install>/base.apk\",\"installed\":"),
+            std::string::npos);
+}
+
 // It is the user's.
 TEST_F(ManyFiles, ListIsNotOverwritten) {
   const ProcessResult run =

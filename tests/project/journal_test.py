@@ -46,7 +46,10 @@ def runs(package, folder):
     yield ["--trust", jar, jar]
     alone = folder / "alone.apk"
     shutil.copy(package, alone)
-    yield ["--strict", alone]
+    yield ["--strict", "--install=no", alone]
+    yield ["--install", alone]
+    (folder / "empty").mkdir()
+    yield ["--recursive", folder / "empty"]
     yield [damaged]
     yield [odd_name]
 

@@ -102,6 +102,12 @@ TEST(Options, InstallTakesItsValueAfterAnEqualsSignAlone) {
   const Options options = Parsed({"--install", "arm"});
   EXPECT_EQ(options.run.abi, InstalledAbi::kPreferred);
   EXPECT_EQ(options.files.names, Lines({"arm"}));
+  EXPECT_EQ(options.run.install, InstallWhen::kAlways);
+  EXPECT_EQ(Parsed({"a.apk"}).run.install, InstallWhen::kAlone);
+  EXPECT_EQ(Parsed({"a.apk"}).run.abi, InstalledAbi::kPreferred);
+  EXPECT_EQ(Parsed({"--install=no", "a.apk"}).run.install, InstallWhen::kNever);
+  EXPECT_EQ(Parsed({"--install=no", "--install=arm", "a.apk"}).run.install, InstallWhen::kAlways);
+  EXPECT_EQ(Parsed({"--verify", "a.apk"}).run.install, InstallWhen::kNever);
   EXPECT_EQ(Parsed({"--", "--install"}).files.names, Lines({"--install"}));
 }
 
