@@ -24,7 +24,7 @@ _apktoolkit_sim() {
       mapfile -t COMPREPLY < <(compgen -W "0 65540 -1" -- "$word")
       ;;
     --install)
-      mapfile -t COMPREPLY < <(compgen -W "phone all arm64 arm" -- "$word")
+      mapfile -t COMPREPLY < <(compgen -W "phone all arm64 arm no" -- "$word")
       ;;
     --installer)
       mapfile -t COMPREPLY < <(compgen -W "auto required off" -- "$word")
@@ -36,6 +36,10 @@ _apktoolkit_sim() {
       compopt -o filenames
       mapfile -t COMPREPLY < <(compgen -d -- "$word")
       ;;
+    --files-from)
+      compopt -o filenames
+      mapfile -t COMPREPLY < <(compgen -f -- "$word")
+      ;;
     --runner | --tool)
       compopt -o filenames
       mapfile -t COMPREPLY < <(compgen -c -- "$word" && compgen -f -- "$word")
@@ -44,9 +48,10 @@ _apktoolkit_sim() {
     *)
       if [[ $word == -* ]]; then
         mapfile -t COMPREPLY < <(
-          compgen -W "--api --help --html --install --installer --integrity --jobs --journal
-            --json --junit --quiet --runner --sarif --sign-errno --signer --state --strict --timeout
-            --tool --trust --verbose --verify --verify-errno --version --werror --zu-result" -- "$word"
+          compgen -W "--api --files-from --help --html --install --installer --integrity --jobs --journal
+            --json --junit --null --quiet --recursive --runner --sarif --sign-errno --signer --state
+            --strict --timeout --tool --trust --verbose --verify --verify-errno --version --werror
+            --zu-result" -- "$word"
         )
       else
         compopt -o filenames

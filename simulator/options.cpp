@@ -36,6 +36,7 @@ constexpr struct {
                       {"off", InstallerUse::kOff}};
 
 constexpr char kInstall[] = "--install";
+constexpr char kInstallNo[] = "no";
 constexpr struct {
   const char* name;
   InstalledAbi abi;
@@ -47,6 +48,7 @@ constexpr struct {
 std::vector<std::string> CommandLineOf(int argc, char** argv);
 void AddPhone(CLI::App* app, Options* options);
 void AddKernelAnswer(CLI::App* app, const char* name, int* error, const char* description);
+void AddFiles(CLI::App* app, Options* options);
 void AddInstallation(CLI::App* app, Options* options);
 void AddInstaller(CLI::App* app, Options* options);
 void AddGate(CLI::App* app, Options* options);
@@ -56,6 +58,7 @@ void AddVerify(CLI::App* app, Options* options);
 bool ReadLevels(const std::string& text, LevelRange* levels);
 int ErrorNumber(const std::string& name);
 std::optional<int> NameUnknownOption(const CLI::App& app);
+int MissFile();
 
 }  // namespace
 
@@ -67,12 +70,11 @@ std::optional<int> ParseOptions(int argc, char** argv, Options* options) {
   options->installer.program = ProgramDirectory() + "/../lib/apktoolkit/installer.jar";
   std::string runner;
 
-  app.add_option("FILE", options->files, "Packages, JARs or other files")
-      ->type_name("")
-      ->required();
+  app.add_option("FILE", options->files.names, "Packages, JARs or other files")->type_name("");
   app.option_defaults()->group("The phone");
   AddPhone(&app, options);
   app.option_defaults()->group("The run");
+  AddFiles(&app, options);
   AddInstallation(&app, options);
   AddInstaller(&app, options);
   AddGate(&app, options);
@@ -83,15 +85,17 @@ std::optional<int> ParseOptions(int argc, char** argv, Options* options) {
   app.set_version_flag("--version", "apktoolkit-sim " APKTOOLKIT_VERSION, "Print the version");
   try {
     app.parse(CommandLineOf(argc, argv));
-  } catch (const CLI::RequiredError& error) {
-    if (const auto status = NameUnknownOption(app)) return status;
-    app.exit(error);
-    return kUsageError;
+    if (options->verify && options->run.install == InstallWhen::kAlways) {
+      throw CLI::ExcludesError("--verify", kInstall);
+    }
   } catch (const CLI::ParseError& error) {
     return app.exit(error) == 0 ? 0 : kUsageError;
   }
   options->installer.timeout = options->run.timeout;
-  if (options->verify) options->installer.use = InstallerUse::kOff;
+  if (options->verify) {
+    options->installer.use = InstallerUse::kOff;
+    options->run.install = InstallWhen::kNever;
+  }
   for (const std::string& word : Split(runner, ' ')) {
     if (!word.empty()) options->run.runner.push_back(word);
   }
@@ -105,7 +109,9 @@ std::optional<int> ParseOptions(int argc, char** argv, Options* options) {
     options->run.tool =
         ProgramDirectory() + (options->verify ? "/apktoolkit-verify" : "/apktoolkit");
   }
-  return NameUnknownOption(app);
+  if (const auto status = NameUnknownOption(app)) return status;
+  if (options->files.names.empty() && options->files.list.empty()) return MissFile();
+  return {};
 }
 
 namespace {
@@ -155,23 +161,44 @@ void AddKernelAnswer(CLI::App* app, const char* name, int* error, const char* de
   app->add_option_function<std::string>(name, set, description)->type_name("NAME")->check(check);
 }
 
+void AddFiles(CLI::App* app, Options* options) {
+  FileListOptions* const files = &options->files;
+  app->add_flag("--recursive", files->is_recursive,
+                "A directory stands for the packages in and\n"
+                "below it: .apk .jar .apks .xapk .apkm .aab");
+  const auto is_name = [](const std::string& name) {
+    return name.empty() ? "the name is empty" : std::string();
+  };
+  CLI::Option* const list = app->add_option("--files-from", files->list,
+                                            "Read more FILEs from a list, one a line;\n"
+                                            "\"-\" is standard input")
+                                ->type_name("LIST")
+                                ->check(is_name);
+  app->add_flag("-0,--null", files->has_nul, "The names of the list end with NUL bytes")
+      ->needs(list);
+}
+
 void AddInstallation(CLI::App* app, Options* options) {
   const auto install = [options](const std::string& name) {
+    options->run.install = name == kInstallNo ? InstallWhen::kNever : InstallWhen::kAlways;
     for (const auto& abi : kAbis) {
       if (name == abi.name) options->run.abi = abi.abi;
     }
   };
   const auto check = [](const std::string& name) {
-    const bool is_known = std::any_of(std::begin(kAbis), std::end(kAbis),
-                                      [&name](const auto& abi) { return name == abi.name; });
-    return is_known ? std::string() : "there are phone, all, arm64 and arm, and no " + name;
+    const bool is_known =
+        name == kInstallNo || std::any_of(std::begin(kAbis), std::end(kAbis),
+                                          [&name](const auto& abi) { return name == abi.name; });
+    return is_known ? std::string() : "there are phone, all, arm64, arm and no, and no " + name;
   };
   app->add_option_function<std::string>(kInstall, install,
                                         "Lay the libraries out first, as an installer\n"
-                                        "does, in a folder of their own: for phone, all,\n"
-                                        "arm64 or arm [default: phone]")
+                                        "does, in a directory of their own: for phone,\n"
+                                        "all, arm64 or arm; \"no\" never does that\n"
+                                        "[default: phone, if a package lies alone]")
       ->type_name("[=ABI]")
-      ->check(check);
+      ->check(check)
+      ->take_last();
   app->add_flag("--strict", options->judge.is_strict,
                 "A library that does not lie beside its package\n"
                 "counts as refused");
@@ -289,8 +316,8 @@ void AddVerify(CLI::App* app, Options* options) {
                                             "Sign nothing: ask the kernel which FILEs it\n"
                                             "trusts, by the apktoolkit-verify beside this\n"
                                             "program");
-  for (const char* name : {kInstall, "--signer", "--werror", "--strict", "--quiet", "--verbose",
-                           "--html", "--junit", "--sarif"}) {
+  for (const char* name : {"--signer", "--werror", "--strict", "--recursive", "--quiet",
+                           "--verbose", "--html", "--junit", "--sarif"}) {
     verify->excludes(app->get_option(name));
   }
   verify->option_text(" ");  // in place of all that it excludes, which is too long for a line
@@ -304,6 +331,11 @@ std::optional<int> NameUnknownOption(const CLI::App& app) {
   const std::string word = Printable(unknown[0], {});
   std::cerr << "there is no option " << word << " (a file of that name: ./" << word
             << ")\nRun with --help for more information.\n";
+  return kUsageError;
+}
+
+int MissFile() {
+  std::cerr << "FILE is required, or --files-from\nRun with --help for more information.\n";
   return kUsageError;
 }
 

@@ -7,10 +7,12 @@
 
 #include <algorithm>
 #include <cerrno>
+#include <filesystem>
 #include <unordered_set>
 
 #include "apk/apk.h"
 #include "apk/native_libraries.h"
+#include "simulator/package/package_names.h"
 #include "simulator/package/signing_block.h"
 #include "util/file.h"
 #include "util/scoped_fd.h"
@@ -23,6 +25,7 @@ namespace {
 constexpr int kOpenFlags = O_RDONLY | O_CLOEXEC | O_NONBLOCK | O_NOCTTY;
 
 FileKind KindOf(int fd, uint64_t size);
+uint64_t CountPackages(const std::string& directory);
 std::string DigestOf(int fd, const IsLate& is_late);
 bool IsText(const std::string& start);
 void ReadArchive(int fd, const IsLate& is_late, PackageFacts* facts);
@@ -45,6 +48,7 @@ PackageFacts LookAt(const std::string& path, const IsLate& is_late) {
   facts.is_read_only = fstatvfs(file.get(), &system) == 0 && (system.f_flag & ST_RDONLY) != 0;
   if (S_ISDIR(state.st_mode)) {
     facts.kind = FileKind::kDirectory;
+    facts.packages = CountPackages(path);
   } else if (!S_ISREG(state.st_mode)) {
     facts.kind = FileKind::kSpecial;
   } else {
@@ -75,6 +79,18 @@ FileKind KindOf(int fd, uint64_t size) {
   const std::string start = ReadAt(fd, 0, kStart);
   if (start.compare(0, 4, kLocalHeader) == 0) return FileKind::kCutArchive;
   return IsText(start) ? FileKind::kText : FileKind::kNoArchive;
+}
+
+// Of as many of them as can be seen.
+uint64_t CountPackages(const std::string& directory) {
+  namespace fs = std::filesystem;
+  uint64_t count = 0;
+  std::error_code error;
+  for (fs::directory_iterator entry(directory, error); entry != fs::directory_iterator();
+       entry.increment(error)) {
+    count += IsPackageName(entry->path().string()) && !entry->is_directory(error) ? 1 : 0;
+  }
+  return count;
 }
 
 // Empty once it is late, and where the file cannot be read.

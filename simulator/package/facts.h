@@ -51,6 +51,7 @@ struct PackageFacts {
   bool was_changed = false;   // while it was looked at
   uint64_t size = 0;          // of the file, in bytes
   std::string sha256;         // of the file's bytes; empty: it was not read to its end
+  uint64_t packages = 0;      // of a directory: the files in it that have a package's name
   // The zip library's; 0: it is an archive, and what follows is filled.
   int32_t archive_result = -1;
 

@@ -94,8 +94,8 @@ data FileFields(const Report& report, size_t number) {
                   {"details", has_detail ? list{{"detail", Shown(Short(line.detail))}} : list()},
                   {"is_failure", data(line.is_failure)}};
   };
-  AddLines("events", MakeTimeline(report.events, report.path), "the journal has them all", tell,
-           &file);
+  AddLines("events", MakeTimeline(report.events, PathForTool(report)), "the journal has them all",
+           tell, &file);
   return file;
 }
 
@@ -120,6 +120,7 @@ list HeadLines(const Report& report) {
   list lines;
   for (const std::string& fact : OwnerFacts(head, "…")) lines.push_back({"fact", Shown(fact)});
   for (const std::string& fact : AlarmFacts(head)) lines.push_back({"fact", Shown(fact)});
+  if (!report.installed.empty()) lines.push_back({"fact", Shown(kLaidOutText)});
   return lines;
 }
 

@@ -50,6 +50,7 @@ void PrintReport(const Report& report, Detail detail, const Look& look, std::ost
   printer.PrintHead();
   if (detail == Detail::kVerdict) return;
   printer.PrintItems();
+  if (!report.installed.empty()) out << "  " << kLaidOutText << '\n';
   printer.PrintWarnings();
   if (detail == Detail::kAll) printer.PrintUnlisted();
   printer.PrintSigner();
@@ -57,7 +58,7 @@ void PrintReport(const Report& report, Detail detail, const Look& look, std::ost
     printer.PrintNewerSigners();
     printer.PrintChain();
   }
-  PrintTimeline(MakeTimeline(report.events, report.path), look, out);
+  PrintTimeline(MakeTimeline(report.events, PathForTool(report)), look, out);
 }
 
 namespace {

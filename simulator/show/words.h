@@ -56,6 +56,15 @@ std::string NameOf(const Item& item);
 // What came of the item, and why; `verdict` is its report's.
 std::string OutcomeOf(const Item& item, Verdict verdict);
 
+// Where the tool found the file.
+inline const std::string& PathForTool(const Report& report) {
+  return report.installed.empty() ? report.path : report.installed;
+}
+
+// Of a report that has `installed`.
+inline constexpr char kLaidOutText[] =
+    "libraries laid out beside it as an installer does; --install=no leaves it as it lies";
+
 // Whether what to do is said below the item. It is said once for neighbours that need the same, and
 // not where it follows from another; `next` is what stands below, null for nothing.
 bool HasCure(const Item& item, const Item* next);

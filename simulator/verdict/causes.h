@@ -72,6 +72,10 @@ inline constexpr Cause kStandardInputClosed = {"standard-input-closed", Group::k
 inline constexpr Cause kFileLeased = {"file-leased", Group::kNotLookedAt, Severity::kUnseen,
     ChainLink::kKey, "", "another process holds a lease on it",
     "Have that process close the file, and run again; /proc/locks names it by its number."};
+inline constexpr Cause kNoPackages = {"no-packages", Group::kNotLookedAt, Severity::kUnseen,
+    ChainLink::kKey, "", "it is a directory, and no file in it or below it has a package's name",
+    "--recursive takes .apk, .jar, .apks, .xapk, .apkm and .aab. Name other files one by one, or "
+    "with --files-from."};
 
 // ---- The simulation could not tell.
 inline constexpr Cause kToolNotStarted = {"tool-not-started", Group::kSimulation, Severity::kFailed,
@@ -100,7 +104,11 @@ inline constexpr Cause kInterrupted = {"interrupted", Group::kSimulation, Severi
 
 // ---- What the file is.
 inline constexpr Cause kFolder = {"folder", Group::kFile, Severity::kRefused, ChainLink::kKey,
-    "`OpenArchiveFd(`", "it is a folder", "Name the package inside it, such as base.apk."};
+    "`OpenArchiveFd(`", "it is a directory",
+    "Name the package inside it, or give --recursive."};
+inline constexpr Cause kPackageDirectory = {"package-directory", Group::kFile, Severity::kRefused,
+    ChainLink::kKey, "`OpenArchiveFd(`", "it is a directory with %s in it",
+    "Name them all, a base and its splits: DIRECTORY/*.apk; or give --recursive."};
 inline constexpr Cause kSpecialFile = {"special-file", Group::kFile, Severity::kRefused,
     ChainLink::kKey, "`OpenArchiveFd(`", "it is a device, a pipe or a socket", "Name a file."};
 inline constexpr Cause kEmptyFile = {"empty-file", Group::kFile, Severity::kRefused,
@@ -319,11 +327,11 @@ inline constexpr Cause kLibraryInPackage = {"library-in-package", Group::kLibrar
 inline constexpr Cause kLibraryNotInstalled = {"library-not-installed", Group::kLibrary,
     Severity::kAbsent, ChainLink::kNone, "`Can't open file`",
     "no libraries for its processor lie beside the package", "Nothing, where the phone is of "
-    "another kind. For a package that lies alone: --install; for all processors: --install=all."};
+    "another kind. To lay out those of all processors: --install=all."};
 inline constexpr Cause kLibraryNotLaidOut = {"library-not-laid-out", Group::kLibrary,
-    Severity::kAbsent, ChainLink::kNone, "`Can't open file`",
-    "--install lays out no libraries for its processor",
-    "Nothing, where the phone is of another kind. For all processors: --install=all."};
+    Severity::kNothing, ChainLink::kNone, "`Can't open file`",
+    "it is for another processor than the phone's (--install=all lays out those of all)",
+    "Nothing: phones install the libraries of one processor."};
 inline constexpr Cause kLibraryInSubdirectory = {"library-in-subdirectory", Group::kLibrary,
     Severity::kAbsent, ChainLink::kNone, "`Can't open file`",
     "it is in a subdirectory of its ABI: the tool looks for %s, and installers do not put it there",
@@ -343,7 +351,7 @@ inline constexpr Cause kLibraryLeased = {"library-leased", Group::kLibrary, Seve
     ChainLink::kNone, "`Can't open file`", "another process holds a lease on it",
     "Have that process close the file, and run again; /proc/locks names it by its number."};
 inline constexpr Cause kLibraryNotExtracted = {"library-not-extracted", Group::kLibrary,
-    Severity::kRefused, ChainLink::kEntries, "", "--install cannot extract it from the package",
+    Severity::kRefused, ChainLink::kEntries, "", "it cannot be extracted from the package",
     "Copy or build the package again; unzip -t names the fault."};
 inline constexpr Cause kLibraryBehindDamage = {"library-behind-damage", Group::kLibrary,
     Severity::kRefused, ChainLink::kNone, "",
@@ -449,8 +457,8 @@ inline constexpr Cause kUnlistedEntries = {"unlisted-entries", Group::kWarning, 
     ChainLink::kNone, "", "the signature does not protect %s: no digest in the manifest",
     "Sign the package again, as the last step that changes it; --verbose lists them."};
 inline constexpr Cause kNotLaidOut = {"not-laid-out", Group::kWarning, Severity::kWarning,
-    ChainLink::kNone, "", "--install leaves out %s",
-    "An installer takes files of the form lib/ABI/NAME that can be extracted."};
+    ChainLink::kNone, "", "an installer leaves out %s",
+    "Build the package again with its libraries as lib/ABI/NAME."};
 inline constexpr Cause kCertificateOtherKey = {"certificate-other-key", Group::kWarning,
     Severity::kAlarm, ChainLink::kNone, "",
     "its certificate shows another key than the tool reads: %s", "Do not trust this package, if it "

@@ -71,7 +71,7 @@ std::vector<Library> MatchAttempts(const RunRecord& run, const std::vector<Libra
   }
   if (attempt == run.libraries.end()) return libraries;
   libraries.clear();
-  const std::string directory = run.path.substr(0, run.path.rfind('/') + 1);
+  const std::string directory = run.PathForTool().substr(0, run.PathForTool().rfind('/') + 1);
   for (const Attempt& each : run.libraries) {
     const bool is_below = each.path.compare(0, directory.size(), directory) == 0;
     Library library;
@@ -134,8 +134,8 @@ Reason WhyNotThere(const LibraryFacts& library, const RunRecord& run, const Pack
   if (std::count(library.place.begin(), library.place.end(), '/') > 2) {
     return {&cause::kLibraryInSubdirectory, library.place};
   }
-  if (library.has_directory) return {&cause::kLibraryMissing, ""};
-  return {run.was_laid_out ? &cause::kLibraryNotLaidOut : &cause::kLibraryNotInstalled, ""};
+  if (run.of_other_processors.count(library.entry) > 0) return {&cause::kLibraryNotLaidOut, ""};
+  return {library.has_directory ? &cause::kLibraryMissing : &cause::kLibraryNotInstalled, ""};
 }
 
 }  // namespace

@@ -30,6 +30,7 @@ Report MakeReport(const RunRecord& run, const PackageFacts& facts, const JudgeOp
   Report report;
   report.file = run.file;
   report.path = run.path;
+  report.installed = run.installed;
   report.events = run.events;
   report.installer = installer;
   report.file_size = facts.size;
@@ -37,7 +38,7 @@ Report MakeReport(const RunRecord& run, const PackageFacts& facts, const JudgeOp
   report.tool = run.tool;
   Reason failure = WhyFailed(run.failure);
   if (failure.cause == nullptr && run.is_silent && !run.signal) {
-    const Reason unseen = WhyNotLookedAt(facts, run.has_standard_input);
+    const Reason unseen = WhyNotLookedAt(run, facts);
     if (run.status != 0) {
       failure = {&cause::kToolFailed, std::to_string(run.status)};
     } else if (unseen.cause == nullptr) {

@@ -13,8 +13,9 @@ namespace simulator {
 // JAR.
 Reason WhyRefused(const RunRecord& run, const PackageFacts& facts);
 
-// For a file that the tool did not look at; a null cause when it had no reason not to.
-Reason WhyNotLookedAt(const PackageFacts& facts, bool has_standard_input);
+// For a file that the tool did not look at, or a directory that it was not run for; a null cause
+// when there was no reason not to.
+Reason WhyNotLookedAt(const RunRecord& run, const PackageFacts& facts);
 
 // What an archive without AndroidManifest.xml is, where it was hardly meant for a JAR; a null cause
 // for what may be one.

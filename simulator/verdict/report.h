@@ -99,8 +99,9 @@ struct Link {
 };
 
 struct Report {
-  std::string file;  // as given
-  std::string path;  // absolute, without symbolic links
+  std::string file;       // as given
+  std::string path;       // absolute, without symbolic links
+  std::string installed;  // of a package that was laid out: <install>/base.apk; else empty
   Verdict verdict = Verdict::kNotSimulated;
   std::string package_name;  // as the tool reads it
   std::vector<Item> items;

@@ -26,6 +26,8 @@ std::string ByRsa2048() {
 }
 
 constexpr size_t kAll = 1000;
+constexpr char kLaidOut[] =
+    "  libraries laid out beside it as an installer does; --install=no leaves it as it lies";
 
 // The first lines of all, and the status. Where something was refused, the line of the verdict has
 // the reason of the first line with a cross; here it is left out again.
@@ -144,6 +146,36 @@ TEST_F(Reason, KeyOfMoreThan4096Bits) {
                    "-> 1"}));
 }
 
+TEST_F(Reason, DsaKey) {
+  Do("LC_ALL=C.UTF-8 keytool -genkeypair -keyalg DSA -keysize 2048 -sigalg SHA256withDSA "
+     "-validity 10000 -alias cert -dname CN=Own -keystore key.p12 -storepass android "
+     "2>keytool.log;"
+     "apksigner sign --ks key.p12 --ks-pass pass:android --v1-signer-name CERT "
+     "--min-sdk-version 21 --in " +
+     std::string(GOLDEN_PACKAGES) + "/unsigned.apk --out base.apk");
+  EXPECT_EQ(Told(3), Lines({"REFUSED  base.apk",
+                            "  ✗ package                not signed: its key is a DSA key, and this "
+                            "tool knows RSA alone",
+                            "      Sign it with an RSA key of 2048 to 4096 bits. That is another "
+                            "signer:",
+                            "-> 1"}));
+}
+
+// Whoever follows the cure has to know what it costs.
+TEST_F(Reason, AnotherKeyIsAnotherSignerAndRotationDoesNotHelp) {
+  for (const char* name : {"apksigner-ec", "apksigner-5120"}) {
+    Do("rm -rf -- *");
+    Take(name);
+    const Lines told = Told(kAll);
+    ASSERT_GT(told.size(), 5U);
+    EXPECT_EQ(told[2] + told[3] + told[4],
+              "      Sign it with an RSA key of 2048 to 4096 bits. That is another signer:"
+              "      phones refuse it as an update of a published app. Rotation does not"
+              "      help: the JAR signature stays the first key's.")
+        << name;
+  }
+}
+
 // Every keytool signs the certificate of a key of this size with SHA-384 unless it is told
 // otherwise, and what the cure says helps.
 TEST_F(Reason, CertificateSignedWithALongerDigest) {
@@ -190,8 +222,8 @@ TEST_F(Reason, ExponentOfOne) {
 
 TEST_F(Reason, Folder) {
   EXPECT_EQ(Told(3, {}, "."),
-            Lines({"REFUSED  .", "  ✗ file  not signed: it is a folder",
-                   "      Name the package inside it, such as base.apk.", "-> 1"}));
+            Lines({"REFUSED  .", "  ✗ file  not signed: it is a directory",
+                   "      Name the package inside it, or give --recursive.", "-> 1"}));
 }
 
 TEST_F(Reason, EmptyFile) {
@@ -365,6 +397,7 @@ TEST_F(Reason, EncryptedEntry) {
 TEST_F(Reason, ArchivesThatAreNoPackage) {
   Take("apksigner-sha256-2048");
   Do("touch BundleConfig.pb; zip -q app.aab BundleConfig.pb; zip -q set.apks base.apk;"
+     "echo '{}' >manifest.json; zip -q set.xapk manifest.json base.apk;"
      "zip -q -d base.apk AndroidManifest.xml");
   EXPECT_EQ(
       Told(3, {}, "app.aab"),
@@ -377,6 +410,11 @@ TEST_F(Reason, ArchivesThatAreNoPackage) {
              "  ✗ JAR  not signed: it is an archive of packages (.apks, .xapk), and no "
              "package itself",
              "      Unpack it, and name the packages in it, the base and its splits.", "-> 1"}));
+  EXPECT_EQ(Told(2, {}, "set.xapk"),
+            Lines({"REFUSED  set.xapk",
+                   "  ✗ JAR  not signed: it is an archive of packages (.apks, .xapk), and no "
+                   "package itself",
+                   "-> 1"}));
   EXPECT_EQ(Told(2)[1].substr(0, 50), "  ✗ JAR  not signed: it has parts of a package (");
 }
 
@@ -401,17 +439,31 @@ TEST_F(Reason, KeyOf512BitsIsSignedWithAWarning) {
             told.end());
 }
 
-// What helps is not what was given already.
-TEST_F(Reason, LibrariesThatInstallDidNotLayOut) {
+// Phones install the libraries of one processor, and so they are no refusal.
+TEST_F(Reason, LibrariesOfAnotherProcessorAreNotLaidOut) {
   Take("apksigner-sha256-2048");
   Do("rm -r lib");
-  const Lines told = Told(kAll, {"--install"});
-  const auto at = std::find(told.begin(), told.end(),
-                            "  – lib/arm/libvault.so    nothing to sign: --install lays out no "
-                            "libraries for its processor");
-  ASSERT_NE(at, told.end());
-  EXPECT_EQ(at[1], "      Nothing, where the phone is of another kind. For all processors:");
-  EXPECT_EQ(at[2], "      --install=all.");
+  const std::string other =
+      "nothing to sign: it is for another processor than the phone's (--install=all lays out those "
+      "of all)";
+  EXPECT_EQ(
+      Told(6, {"--install", "--strict"}),
+      Lines({"SIGNED  base.apk" + ByRsa2048(), kSigned, "  ✓ lib/arm64/libvault.so  signed",
+             "  – lib/arm/libvault.so    " + other,
+             "  ✓ key                    registered for com.example.vault", kLaidOut, "-> 0"}));
+  EXPECT_EQ(Told(4, {"--install=arm", "--strict"}),
+            Lines({"SIGNED  base.apk" + ByRsa2048(), kSigned, "  – lib/arm64/libvault.so  " + other,
+                   "  ✓ lib/arm/libvault.so    signed", "-> 0"}));
+  EXPECT_EQ(Told(4, {"--install=all", "--strict"}).back(), "-> 0");
+}
+
+// What was asked for and is not there stays a refusal.
+TEST_F(Reason, StrictRefusesALibraryThatNoInstallerTakes) {
+  MakePackage(WithLibraries({{"lib/arm64-v8a/libx.so", ToBytes("x")},
+                             {"lib/arm64-v8a/sub/liby.so", ToBytes("y")}}))
+      .WriteTo(folder_ / "base.apk");
+  EXPECT_EQ(Told(1, {"--install", "--strict"}).back(), "-> 1");
+  EXPECT_EQ(Told(1, {"--install"}).back(), "-> 0");
 }
 
 // The command that is told makes a certificate for the same key that the tool takes.
@@ -447,8 +499,8 @@ TEST_F(Reason, LibrariesThatDoNotLieBesideThePackage) {
   EXPECT_EQ(Told(7),
             Lines({"SIGNED  base.apk" + ByRsa2048(), kSigned,
                    "  – lib/arm64/libvault.so  " + absent, "  – lib/arm/libvault.so    " + absent,
-                   "      Nothing, where the phone is of another kind. For a package that lies",
-                   "      alone: --install; for all processors: --install=all.",
+                   "      Nothing, where the phone is of another kind. To lay out those of all",
+                   "      processors: --install=all.",
                    "  ✓ key                    registered for com.example.vault", "-> 0"}));
   EXPECT_EQ(Told(1, {"--strict"}), Lines({"PARTLY SIGNED  base.apk", "-> 1"}));
   EXPECT_EQ(Told(5, {"--install=all"}),
@@ -456,6 +508,32 @@ TEST_F(Reason, LibrariesThatDoNotLieBesideThePackage) {
                    "  ✓ lib/arm/libvault.so    signed",
                    "  ✓ key                    registered for com.example.vault", "-> 0"}));
   EXPECT_EQ(Told(4, {"--install"})[2], "  ✓ lib/arm64/libvault.so  signed");
+}
+
+// A store's package is looked at as phones have it, and nobody has to ask for that.
+TEST_F(Reason, PackageThatLiesAloneIsLaidOut) {
+  Take("apksigner-sha256-2048");
+  Do("rm -r lib");
+  const auto run = [this] {
+    return RunProcess({"env", "LC_ALL=C.UTF-8", SimulatorPath(), "--installer=off", "base.apk"},
+                      folder_.path());
+  };
+  const ProcessResult alone = run();
+  EXPECT_EQ(alone.status, 0);
+  EXPECT_NE(alone.output.find("  ✓ lib/arm64/libvault.so  signed\n"), std::string::npos);
+  EXPECT_NE(alone.output.find(std::string("\n") + kLaidOut + "\n"), std::string::npos);
+  // One of the installer's directories is there, and so it was installed.
+  for (const std::string place : {"lib/arm64", "lib/arm"}) {
+    Do("rm -rf lib; mkdir -p " + place);
+    const ProcessResult installed = run();
+    EXPECT_NE(installed.output.find("  – lib/arm64/libvault.so  nothing to sign: "),
+              std::string::npos)
+        << installed.output;
+    EXPECT_EQ(installed.output.find("laid out"), std::string::npos);
+  }
+  // Another directory of that name is nobody's.
+  Do("rm -rf lib; mkdir lib");
+  EXPECT_EQ(run().output, alone.output);
 }
 
 TEST_F(Reason, LibraryOfOneProcessorThatWasNotInstalled) {

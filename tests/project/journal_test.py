@@ -46,8 +46,11 @@ def runs(package, folder):
     yield ["--trust", jar, jar]
     alone = folder / "alone.apk"
     shutil.copy(package, alone)
-    yield ["--strict", alone]
+    yield ["--strict", "--install=no", alone]
     yield ["--signer", "0" * 64, alone]
+    yield ["--install", alone]
+    (folder / "empty").mkdir()
+    yield ["--recursive", folder / "empty"]
     yield [damaged]
     yield [odd_name]
 

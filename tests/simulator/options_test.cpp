@@ -35,7 +35,7 @@ ProcessResult Told(const Lines& words) {
 
 TEST(Options, DefaultIsAHealthyPhone) {
   const Options options = Parsed({"a.apk"});
-  EXPECT_EQ(options.files, Lines({"a.apk"}));
+  EXPECT_EQ(options.files.names, Lines({"a.apk"}));
   EXPECT_EQ(options.run.phone.integrity, Lines({"1f"}));
   EXPECT_EQ(options.run.phone.sign_errno, 0);
   EXPECT_EQ(options.run.phone.verify_errno, ENOKEY);
@@ -71,7 +71,7 @@ TEST(Options, TrustTakesOneFileAtATime) {
   const Options options =
       Parsed({"--trust", "/dev/zero", "--trust", "/dev/null", "a.apk", "b.apk"});
   EXPECT_EQ(options.run.trust, Lines({"/dev/zero", "/dev/null"}));
-  EXPECT_EQ(options.files, Lines({"a.apk", "b.apk"}));
+  EXPECT_EQ(options.files.names, Lines({"a.apk", "b.apk"}));
 }
 
 TEST(Options, TheRestIsTakenAsItIs) {
@@ -85,7 +85,7 @@ TEST(Options, TheRestIsTakenAsItIs) {
   EXPECT_EQ(options.run.tool, "t");
   EXPECT_EQ(options.run.timeout, 0.5);
   EXPECT_EQ(options.run.runner, Lines({"emulator", "-L", "/root"}));
-  EXPECT_EQ(options.files, Lines({"-a.apk"}));
+  EXPECT_EQ(options.files.names, Lines({"-a.apk"}));
 }
 
 TEST(Options, WordsOfTheRunAreTakenAsTheyAre) {
@@ -101,8 +101,30 @@ TEST(Options, InstallTakesItsValueAfterAnEqualsSignAlone) {
   EXPECT_EQ(Parsed({"--install=arm", "a.apk"}).run.abi, InstalledAbi::kArm);
   const Options options = Parsed({"--install", "arm"});
   EXPECT_EQ(options.run.abi, InstalledAbi::kPreferred);
-  EXPECT_EQ(options.files, Lines({"arm"}));
-  EXPECT_EQ(Parsed({"--", "--install"}).files, Lines({"--install"}));
+  EXPECT_EQ(options.files.names, Lines({"arm"}));
+  EXPECT_EQ(options.run.install, InstallWhen::kAlways);
+  EXPECT_EQ(Parsed({"a.apk"}).run.install, InstallWhen::kAlone);
+  EXPECT_EQ(Parsed({"a.apk"}).run.abi, InstalledAbi::kPreferred);
+  EXPECT_EQ(Parsed({"--install=no", "a.apk"}).run.install, InstallWhen::kNever);
+  EXPECT_EQ(Parsed({"--install=no", "--install=arm", "a.apk"}).run.install, InstallWhen::kAlways);
+  EXPECT_EQ(Parsed({"--verify", "a.apk"}).run.install, InstallWhen::kNever);
+  EXPECT_EQ(Parsed({"--", "--install"}).files.names, Lines({"--install"}));
+}
+
+TEST(Options, FilesComeFromTheCommandLineOrAList) {
+  const Options named = Parsed({"a.apk"});
+  EXPECT_EQ(named.files.list, "");
+  EXPECT_FALSE(named.files.has_nul);
+  EXPECT_FALSE(named.files.is_recursive);
+  const Options listed = Parsed({"--files-from", "-", "-0", "--recursive"});
+  EXPECT_EQ(listed.files.names, Lines());
+  EXPECT_EQ(listed.files.list, "-");
+  EXPECT_TRUE(listed.files.has_nul);
+  EXPECT_TRUE(listed.files.is_recursive);
+}
+
+TEST(Options, MissingFileIsTold) {
+  EXPECT_EQ(LinesOf(Told({}).errors)[0], "FILE is required, or --files-from");
 }
 
 TEST(Options, InstallerIsAskedWhereItIsThereAboutAllPhonesOfTheTool) {
@@ -196,6 +218,11 @@ TEST(Options, MistakesAreReportedWithStatusTwo) {
                                        {"--jobs", "x", "a.apk"},
                                        {"--install=x86", "a.apk"},
                                        {"--install"},
+                                       {"--recursive"},
+                                       {"--files-from"},
+                                       {"--files-from", ""},
+                                       {"-0", "a.apk"},
+                                       {"--recursive", "--verify", "a.apk"},
                                        {"--quiet", "--verbose", "a.apk"},
                                        {"--integrity"}};
   for (const Lines& words : mistakes) {
@@ -228,6 +255,9 @@ TEST(Options, HelpNamesEveryOptionAndStatus) {
                            "--zu-result N",
                            "--state DIR",
                            "\nThe run:\n",
+                           "--recursive ",
+                           "--files-from LIST",
+                           "-0,--null ",
                            "--install [=ABI]",
                            "--strict ",
                            "--quiet ",

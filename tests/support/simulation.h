@@ -10,7 +10,8 @@ struct Simulation {
 };
 
 // Runs the tool on `file` in the simulated phone that `options` describe. Here and below no phone's
-// installer is asked, unless an option says so: the tool's own answers are what most tests are for.
+// installer is asked and no library laid out, unless an option says so: most tests are for the
+// tool's own answers about what lies there.
 // A simulation that itself fails, or that writes anything on standard error, is a test failure.
 Simulation Simulate(const std::string& file, const std::vector<std::string>& options = {});
 
