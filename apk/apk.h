@@ -1,11 +1,11 @@
 // The opened file: its zip archive, what its manifests say, and how far it verified.
 //
 // An Apk owns its facts, but not the descriptor that it is given. It never writes to the file. Its
-// end closes neither the archive nor the descriptor: the process ends right after the run. Release()
-// is for a process that goes on.
-// Nothing fails by throwing: construction leaves flags that say how far it got, checks answer true
-// or false, and every failure is logged as an error where it is found, unless said otherwise. One
-// thread uses an object from its construction to its end.
+// end closes neither the archive nor the descriptor: the process ends right after the run.
+// Release() is for a process that goes on. Nothing fails by throwing: construction leaves flags
+// that say how far it got, checks answer true or false, and every failure is logged as an error
+// where it is found, unless said otherwise. One thread uses an object from its construction to its
+// end.
 #pragma once
 
 #include <cstdint>
