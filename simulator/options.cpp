@@ -94,6 +94,8 @@ std::optional<int> ParseOptions(int argc, char** argv, Options* options) {
   if (app.count("--tool") == 0) {
     options->run.tool =
         ProgramDirectory() + (options->verify ? "/apktoolkit-verify" : "/apktoolkit");
+  } else {
+    options->show.tool = options->run.tool;
   }
   return NameUnknownOption(app);
 }

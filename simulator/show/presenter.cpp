@@ -3,6 +3,7 @@
 #include <unistd.h>
 
 #include <algorithm>
+#include <ctime>
 #include <iostream>
 
 #include "simulator/phone/journal.h"
@@ -25,7 +26,8 @@ Presenter::Presenter(const ShowOptions& options, size_t file_count)
       has_progress_(isatty(STDERR_FILENO) != 0),
       look_(LookOfStandardOutput()),
       journal_(kJournal, options.journal),
-      page_file_(kPage, options.html) {}
+      page_file_(kPage, options.html),
+      page_({std::time(nullptr), options.tool}) {}
 
 std::optional<std::string> Presenter::Objection(const std::vector<std::string>& inputs) const {
   if (journal_.IsSameAs(page_file_)) return "--journal and --html name the same file";
@@ -57,6 +59,7 @@ void Presenter::Show(const Report& report, const std::string& journal) {
   verdicts_.push_back(report.verdict);
   if (report.installer.state == Judgement::State::kMissing) missing_ = report.installer.why;
   if (report.verdict == Verdict::kNotSimulated) {
+    if (DecisiveItem(report)->reason.cause == &cause::kInterrupted) is_interrupted_ = true;
     Complain(kCannotSimulate, report.file + ": " + DecisiveItem(report)->reason.Text());
   }
   status_ = std::max<int>(status_, StatusOf(report.verdict));
@@ -96,11 +99,18 @@ int Presenter::Finish() {
   EraseProgress();
   if (!options_.json && options_.detail != Detail::kVerdict && file_count_ > 1 &&
       !verdicts_.empty()) {
-    std::cout << '\n' << Summary(verdicts_) << '\n';
+    std::cout << '\n' << Summary(verdicts_, Unseen()) << '\n';
   }
-  if (page_file_.IsWanted() && !page_file_.Append(page_.Html())) FailToWrite(page_file_);
+  if (page_file_.IsWanted() && !page_file_.Append(page_.Html(Unseen()))) FailToWrite(page_file_);
   if (!missing_.empty()) Complain(status_, "no phone's installer was asked: " + missing_);
   return EndWith(status_);
+}
+
+// If the run was interrupted: how many files it did not come to.
+std::optional<size_t> Presenter::Unseen() const {
+  const size_t unseen = file_count_ - shown_;
+  if (unseen == 0 && !is_interrupted_) return std::nullopt;
+  return unseen;
 }
 
 // The journal goes to its file, and to standard output when that is asked for.

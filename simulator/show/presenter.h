@@ -17,6 +17,7 @@ struct ShowOptions {
   Detail detail = Detail::kUsual;  // of the text
   std::string journal;             // where the journal is kept; empty: it is not
   std::string html;                // where the page is written; empty: it is not
+  std::string tool;                // that --tool names; empty: the one of this build
   bool json = false;               // the journal on standard output in place of the text
 };
 
@@ -39,6 +40,7 @@ class Presenter {
   int Finish();
 
  private:
+  std::optional<size_t> Unseen() const;
   void Keep(const std::string& journal);
   void FailToWrite(const OutputFile& file);
   void EraseProgress();
@@ -51,7 +53,8 @@ class Presenter {
   OutputFile page_file_;
   Page page_;
   std::vector<Verdict> verdicts_;
-  size_t shown_ = 0;  // files, by a verdict or an answer
+  bool is_interrupted_ = false;  // while a file was looked at
+  size_t shown_ = 0;             // files, by a verdict or an answer
   bool is_progress_shown_ = false;
   std::string missing_;  // why the installer was not asked; empty: it was, or nobody wanted it
   int status_ = kAllSigned;
