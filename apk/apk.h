@@ -2,13 +2,15 @@
 //
 // An Apk owns its facts, but not the descriptor that it is given. It never writes to the file. Its
 // end closes neither the archive nor the descriptor: the process ends right after the run.
-// Nothing fails by throwing: construction leaves flags that say how far it got, checks answer true
-// or false, and every failure is logged as an error where it is found, unless said otherwise. One
-// thread uses an object from its construction to its end.
+// Release() is for a process that goes on. Nothing fails by throwing: construction leaves flags
+// that say how far it got, checks answer true or false, and every failure is logged as an error
+// where it is found, unless said otherwise. One thread uses an object from its construction to its
+// end.
 #pragma once
 
 #include <cstdint>
 #include <string>
+#include <utility>
 #include <vector>
 
 #include "apk/entry_digests.h"
@@ -42,6 +44,10 @@ class Apk {
   // The outcome is read from the flags below. Called again, it starts from cleared flags; a fact
   // that it does not get to keeps what it was.
   void Init(int fd, const char* path);
+
+  // Closes the archive, and the descriptor if Init opened it. The facts stay. Nothing may read an
+  // entry afterwards, and StartIteration fails. Called again, it does nothing.
+  void Release() { CloseArchive(std::exchange(zip_handle_, nullptr)); }
 
   // The path given to Init, or the descriptor's; may be empty.
   const std::string& GetPath() const { return path_; }

@@ -48,8 +48,7 @@ bool Apk::OpenZip(bool own_fd) {
 int32_t Apk::ExtractEntry(const std::string& name, std::vector<uint8_t>& out) {
   ZipEntry entry;
   const int32_t result = FindZipEntry(zip_handle_, name, &entry);
-  if (result != 0) return result;
-  return ExtractZipEntry(zip_handle_, &entry, out);
+  return result != 0 ? result : ExtractZipEntry(zip_handle_, &entry, out);
 }
 
 }  // namespace ApkTools

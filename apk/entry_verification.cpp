@@ -10,8 +10,7 @@
 namespace ApkTools {
 
 bool Apk::IsGoodApk() {
-  if (!is_good_apk_) return false;
-  if (dex_checked_) return true;
+  if (!is_good_apk_ || dex_checked_) return is_good_apk_;
   if (!VerifyDex()) {
     LogError("Integrity not confirmed: classes.dex\n");
     is_good_apk_ = false;

@@ -10,9 +10,11 @@ include(CMakePackageConfigHelpers)
 set(APKTOOLKIT_HEADER_DIR ${CMAKE_INSTALL_INCLUDEDIR}/apktoolkit)
 set(APKTOOLKIT_CONFIG_DIR ${CMAKE_INSTALL_LIBDIR}/cmake/apktoolkit)
 
-install(DIRECTORY apk crypto util DESTINATION ${APKTOOLKIT_HEADER_DIR}
+install(DIRECTORY apk crypto library util DESTINATION ${APKTOOLKIT_HEADER_DIR}
   FILES_MATCHING PATTERN "*.h")
-install(TARGETS apktoolkit_core EXPORT apktoolkit INCLUDES DESTINATION ${APKTOOLKIT_HEADER_DIR})
+install(TARGETS apktoolkit_core apktoolkit_verification EXPORT apktoolkit
+  INCLUDES DESTINATION ${APKTOOLKIT_HEADER_DIR})
+set_target_properties(apktoolkit_verification PROPERTIES EXPORT_NAME verification)
 set_target_properties(apktoolkit_core PROPERTIES EXPORT_NAME core)
 target_compile_features(apktoolkit_core PUBLIC cxx_std_17)
 

@@ -108,6 +108,8 @@ std::optional<int> ParseOptions(int argc, char** argv, Options* options) {
   if (options->run.is_own_tool) {
     options->run.tool =
         ProgramDirectory() + (options->verify ? "/apktoolkit-verify" : "/apktoolkit");
+  } else {
+    options->show.tool = options->run.tool;
   }
   if (const auto status = NameUnknownOption(app)) return status;
   if (options->files.names.empty() && options->files.list.empty()) return MissFile();

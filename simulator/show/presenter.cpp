@@ -3,6 +3,7 @@
 #include <unistd.h>
 
 #include <algorithm>
+#include <ctime>
 #include <iostream>
 
 #include "simulator/phone/journal.h"
@@ -29,6 +30,7 @@ Presenter::Presenter(const ShowOptions& options, size_t file_count)
       look_(LookOfStandardOutput()),
       journal_(kJournal, options.journal),
       page_file_(kPage, options.html),
+      page_({std::time(nullptr), options.tool}),
       junit_file_(kJunit, options.junit),
       sarif_file_(kSarif, options.sarif) {}
 
@@ -72,6 +74,7 @@ void Presenter::Show(const Report& report, const std::string& journal) {
   verdicts_.push_back(report.verdict);
   if (report.installer.state == Judgement::State::kMissing) missing_ = report.installer.why;
   if (report.verdict == Verdict::kNotSimulated) {
+    if (DecisiveItem(report)->reason.cause == &cause::kInterrupted) is_interrupted_ = true;
     Complain(kCannotSimulate, report.file + ": " + DecisiveItem(report)->reason.Text());
   }
   status_ = std::max<int>(status_, StatusOf(report.verdict));
@@ -111,14 +114,21 @@ int Presenter::Finish(const std::vector<std::string>& files) {
   EraseProgress();
   if (!options_.json && options_.detail != Detail::kVerdict && file_count_ > 1 &&
       !verdicts_.empty()) {
-    std::cout << '\n' << Summary(verdicts_) << '\n';
+    std::cout << '\n' << Summary(verdicts_, Unseen()) << '\n';
   }
-  if (page_file_.IsWanted() && !page_file_.Append(page_.Html())) FailToWrite(page_file_);
+  if (page_file_.IsWanted() && !page_file_.Append(page_.Html(Unseen()))) FailToWrite(page_file_);
   ReportUntold({files.begin() + static_cast<std::ptrdiff_t>(shown_), files.end()},
                {&cause::kInterrupted, ""});
   WriteReports();
   if (!missing_.empty()) Complain(status_, "no phone's installer was asked: " + missing_);
   return EndWith(status_);
+}
+
+// If the run was interrupted: how many files it did not come to.
+std::optional<size_t> Presenter::Unseen() const {
+  const size_t unseen = file_count_ - shown_;
+  if (unseen == 0 && !is_interrupted_) return std::nullopt;
+  return unseen;
 }
 
 int Presenter::GiveUp(const std::vector<std::string>& files, const std::string& problem) {

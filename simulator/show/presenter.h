@@ -21,6 +21,7 @@ struct ShowOptions {
   std::string html;                // where the page is written; empty: it is not
   std::string junit;               // where the JUnit report is written; empty: it is not
   std::string sarif;               // where the SARIF log is written; empty: it is not
+  std::string tool;                // that --tool names; empty: the one of this build
   bool json = false;               // the journal on standard output in place of the text
 };
 
@@ -46,6 +47,7 @@ class Presenter {
   int GiveUp(const std::vector<std::string>& files, const std::string& problem);
 
  private:
+  std::optional<size_t> Unseen() const;
   void Keep(const std::string& journal);
   void ReportUntold(const std::vector<std::string>& files, const Reason& why);
   void WriteReports();
@@ -64,7 +66,8 @@ class Presenter {
   OutputFile sarif_file_;
   Sarif sarif_;
   std::vector<Verdict> verdicts_;
-  size_t shown_ = 0;  // files, by a verdict or an answer
+  bool is_interrupted_ = false;  // while a file was looked at
+  size_t shown_ = 0;             // files, by a verdict or an answer
   bool is_progress_shown_ = false;
   std::string missing_;  // why the installer was not asked; empty: it was, or nobody wanted it
   int status_ = kAllSigned;

@@ -21,13 +21,16 @@ constexpr VerdictWords kVerdicts[] = {
     {"not-simulated", "NOT SIMULATED", "not simulated", "not simulated", Mood::kBad},
 };
 
-std::string SignerText(const Report& report, const char* ellipsis);
-
 }  // namespace
 
 const VerdictWords& WordsOf(Verdict verdict) { return kVerdicts[static_cast<size_t>(verdict)]; }
 
-std::string Summary(const std::vector<Verdict>& verdicts) {
+const char* MoodCode(Mood mood) {
+  constexpr const char* kCodes[] = {"good", "mixed", "bad"};
+  return kCodes[static_cast<size_t>(mood)];
+}
+
+std::string Summary(const std::vector<Verdict>& verdicts, std::optional<size_t> unseen) {
   std::string text = Counted(verdicts.size(), "file", "files");
   const char* separator = ": ";
   for (const VerdictWords& words : kVerdicts) {
@@ -37,6 +40,8 @@ std::string Summary(const std::vector<Verdict>& verdicts) {
     text += separator + Counted(static_cast<uint64_t>(count), words.one, words.many);
     separator = ", ";
   }
+  if (unseen) text += "; interrupted";
+  if (unseen.value_or(0) > 0) text += " before " + Counted(*unseen, "more file", "more files");
   return text;
 }
 
@@ -66,11 +71,23 @@ std::vector<std::string> OwnerFacts(const Report& report, const char* ellipsis) 
   std::vector<std::string> facts;
   if (!report.package_name.empty()) facts.push_back(report.package_name);
   if (report.signer || report.key) facts.push_back("signer " + SignerText(report, ellipsis));
-  if (report.verdict == Verdict::kOtherSigner) {
-    const CertificateFacts* const other = OtherSigner(report.installer, report);
-    if (other != nullptr) facts.push_back("phones install it for " + other->subject);
-  }
+  if (std::string other = OtherOwnerText(report); !other.empty()) facts.push_back(other);
   return facts;
+}
+
+std::string SignerText(const Report& report, const char* ellipsis) {
+  std::string text = report.signer ? report.signer->subject : "unknown";
+  if (const std::string key = KeyName(report); !key.empty()) text += ", " + key;
+  if (!report.key) return text;
+  const std::string& digest = report.key->sha256;
+  if (digest.size() < 16) return text + ", key " + digest;
+  return text + ", key " + digest.substr(0, 8) + ellipsis + digest.substr(digest.size() - 6);
+}
+
+std::string OtherOwnerText(const Report& report) {
+  if (report.verdict != Verdict::kOtherSigner) return {};
+  const CertificateFacts* const other = OtherSigner(report.installer, report);
+  return other == nullptr ? "" : "phones install it for " + other->subject;
 }
 
 std::vector<std::string> AlarmFacts(const Report& report) {
@@ -89,6 +106,11 @@ Mark MarkOf(ItemState state) {
 Mark MarkOf(LinkState state) {
   if (state == LinkState::kHolds) return Mark::kGood;
   return state == LinkState::kBroken ? Mark::kBad : Mark::kNeither;
+}
+
+const char* MarkCode(Mark mark) {
+  constexpr const char* kCodes[] = {"good", "bad", "neither"};
+  return kCodes[static_cast<size_t>(mark)];
 }
 
 const char* SymbolOf(Mark mark, bool has_utf8) {
@@ -150,19 +172,5 @@ Rows SignerRows(const Report& report) {
   rows.emplace_back("modulus SHA-256 digest", report.key->sha256 + " (of the modulus alone" + use);
   return rows;
 }
-
-namespace {
-
-// Such as "CN=Vault, RSA-2048, key 98302ce8…f64646".
-std::string SignerText(const Report& report, const char* ellipsis) {
-  std::string text = report.signer ? report.signer->subject : "unknown";
-  if (const std::string key = KeyName(report); !key.empty()) text += ", " + key;
-  if (!report.key) return text;
-  const std::string& digest = report.key->sha256;
-  if (digest.size() < 16) return text + ", key " + digest;
-  return text + ", key " + digest.substr(0, 8) + ellipsis + digest.substr(digest.size() - 6);
-}
-
-}  // namespace
 
 }  // namespace simulator

@@ -2,6 +2,7 @@
 // from the files as they are: whoever shows them sees to what may be shown.
 #pragma once
 
+#include <optional>
 #include <string>
 #include <utility>
 #include <vector>
@@ -24,12 +25,22 @@ struct VerdictWords {
 
 const VerdictWords& WordsOf(Verdict verdict);
 
-// Such as "3 files: 1 signed, 2 refused".
-std::string Summary(const std::vector<Verdict>& verdicts);
+// "good", "mixed" or "bad", for programs.
+const char* MoodCode(Mood mood);
+
+// Such as "3 files: 1 signed, 2 refused". Of a run that was interrupted also that it was, and
+// before how many more files: `unseen`.
+std::string Summary(const std::vector<Verdict>& verdicts, std::optional<size_t> unseen = {});
 
 // Whose package it is: its name, the signer and his key, and, where phones install it for another,
 // that one. `ellipsis` stands in the midst of a digest.
 std::vector<std::string> OwnerFacts(const Report& report, const char* ellipsis);
+
+// The JAR signer and his key, such as "CN=Vault, RSA-2048, key 98302ce8…f64646".
+std::string SignerText(const Report& report, const char* ellipsis);
+
+// For whom phones install it, if that is another than the JAR signer; else empty.
+std::string OtherOwnerText(const Report& report);
 
 // The warnings that are alarms.
 std::vector<std::string> AlarmFacts(const Report& report);
@@ -47,6 +58,9 @@ enum class Mark { kGood, kBad, kNeither };
 
 Mark MarkOf(ItemState state);
 Mark MarkOf(LinkState state);
+
+// "good", "bad" or "neither", for programs.
+const char* MarkCode(Mark mark);
 
 // "✓", "✗" and "–", or "+", "x" and "-" where these cannot be shown.
 const char* SymbolOf(Mark mark, bool has_utf8);

@@ -9,7 +9,6 @@ namespace simulator {
 namespace {
 
 std::string LevelsText(const std::vector<RangeJudgement>& ranges, bool is_verified);
-std::string LevelText(const LevelRange& levels);
 std::string WhyRefusedByInstaller(const InstallerIssue& issue);
 
 }  // namespace
@@ -28,6 +27,12 @@ void AddInstallerItem(const Judgement& judgement, const JudgeOptions& options,
   if (takers.empty()) return add({&cause::kNotInstallable, why});
   add({&cause::kNotInstallableOnSome, LevelsText(judgement.ranges, false) +
                                           " refuse it, those of " + takers + " take it: " + why});
+}
+
+std::string LevelText(const LevelRange& levels) {
+  const std::string first = "API " + std::to_string(levels.first);
+  if (levels.last == kNewestLevel) return first + " and later";
+  return levels.first == levels.last ? first : first + " to " + std::to_string(levels.last);
 }
 
 std::string TakersText(const Judgement& judgement) {
@@ -68,12 +73,6 @@ std::string LevelsText(const std::vector<RangeJudgement>& ranges, bool is_verifi
   std::vector<std::string> texts;
   for (const LevelRange& each : levels) texts.push_back(LevelText(each));
   return Joined(texts);
-}
-
-std::string LevelText(const LevelRange& levels) {
-  const std::string first = "API " + std::to_string(levels.first);
-  if (levels.last == kNewestLevel) return first + " and later";
-  return levels.first == levels.last ? first : first + " to " + std::to_string(levels.last);
 }
 
 // The faults that packages have most often, in words that name the entry; "%s" is the parameter of

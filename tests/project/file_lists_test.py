@@ -58,6 +58,8 @@ def main():
 def hold_tool(platform, problems):
     core = cmake_sources("apktoolkit_core")
     compare("apktoolkit_core", platform.sources("apktoolkit_core"), core, problems)
+    compare("apktoolkit_verification", platform.sources("apktoolkit_verification"),
+            cmake_sources("apktoolkit_verification"), problems)
     compare("apktoolkit", platform.sources("apktoolkit"), cmake_sources("apktoolkit"), problems)
     compare("apktoolkit-verify", platform.sources("apktoolkit-verify"),
             cmake_sources("apktoolkit-verify"), problems)

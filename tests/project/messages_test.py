@@ -141,6 +141,21 @@ def log_problems(messages):
     return problems
 
 
+# A row of the starts of messages that the library makes reasons from.
+LIBRARY = ROOT / "library/verification.cpp"
+LIBRARY_TEXT = re.compile(r"\{(%s), Reason::k\w+\}" % LITERALS)
+
+
+def library_problems(messages):
+    source = LIBRARY.read_text()
+    starts = [joined(text) for text in LIBRARY_TEXT.findall(source)]
+    problems = [f"{LIBRARY}: the tool does not log {start}" for start in starts
+                if not any(message.startswith(start) for message in messages)]
+    if not starts or len(starts) != source.count(", Reason::k"):
+        problems.append(f"{LIBRARY}: a row does not read")
+    return problems
+
+
 def main():
     rows = causes()
     page, schema = PAGE.read_text(), SCHEMA.read_text()
@@ -154,7 +169,7 @@ def main():
     messages = {text for text, _, _ in in_sources}
     problems = [f"not in docs/messages.md: {entry}" for entry in sorted(in_sources - in_page)]
     problems += [f"not in the sources: {entry}" for entry in sorted(in_page - in_sources)]
-    problems += log_problems(messages) + reasons_problems(rows, messages)
+    problems += log_problems(messages) + reasons_problems(rows, messages) + library_problems(messages)
     problems += [f"{path} is not as tests/project/messages_test.py --write makes it"
                  for path, is_right in ((PAGE, page == right_page), (SCHEMA, schema == right_schema))
                  if not is_right]

@@ -237,7 +237,10 @@ TEST(Page, OfAnInterruptedRunHasWhatWasDone) {
   EXPECT_EQ(run.ended_by, SIGTERM);
   const std::string text = ContentOf(page);
   EXPECT_NE(text.find("<bdi>" + good.path() + "</bdi>"), std::string::npos);
-  EXPECT_NE(text.find("<p>2 files: 1 trusted JAR, 1 not simulated</p>"), std::string::npos) << text;
+  EXPECT_NE(
+      text.find("<p>2 files: 1 trusted JAR, 1 not simulated; interrupted before 1 more file</p>"),
+      std::string::npos)
+      << text;
   EXPECT_NE(text.find("it was interrupted"), std::string::npos);
   EXPECT_NE(text.find("</html>\n"), std::string::npos);
 }
