@@ -1,4 +1,4 @@
-// Reads every *.mf file of a folder with the JDK's own parser, writes what it found to *.dump, and
+// Reads every *.mf file of a directory with the JDK's own parser, writes what it found to *.dump, and
 // the manifest anew to *.rewritten. The dump has a line "Section <name>" per section (the main
 // section, without a name, first) and a line "<attribute>: <value>" per attribute, both in order.
 import java.io.FileInputStream;

@@ -473,10 +473,10 @@ std::string Dump(const Sections& sections) {
 
 TEST(ManifestMf, AgreesWithTheJdkOnWellFormedManifests) {
   constexpr uint32_t kCount = 200;
-  const TempDir folder;
-  const auto path = [&](uint32_t i) { return folder / (std::to_string(i) + ".mf"); };
+  const TempDir directory;
+  const auto path = [&](uint32_t i) { return directory / (std::to_string(i) + ".mf"); };
   for (uint32_t i = 0; i < kCount; ++i) WriteFile(path(i), ToBytes(ManifestWriter(i).Write()));
-  ASSERT_EQ(0, std::system(("java " DUMP_MANIFEST " " + folder.path()).c_str()));
+  ASSERT_EQ(0, std::system(("java " DUMP_MANIFEST " " + directory.path()).c_str()));
   for (uint32_t i = 0; i < kCount; ++i) {
     const std::string expected = ContentOf(path(i) + ".dump");
     EXPECT_EQ(expected, Dump(Parse(ContentOf(path(i))))) << "manifest " << i;

@@ -155,11 +155,11 @@ TEST(ApkMemory, OverlappingStringsOfTheAndroidManifestTakeMuchOfThePlatformsMemo
 // One library at a time, whichever way their sizes go.
 TEST(ApkMemory, LibrariesTakeTheLargestOnesSize) {
   PackageOptions options = WithoutDex();
-  TempDir folder;
+  TempDir directory;
   for (const size_t megabytes : {40, 60, 20, 50}) {
     const std::string name = std::to_string(megabytes);
     Bytes content(megabytes << 20, 0);
-    folder.Write(name, content);
+    directory.Write(name, content);
     options.entries.push_back({name, std::move(content), true});
   }
   const Bytes archive = MakePackage(options).Build();
@@ -168,7 +168,7 @@ TEST(ApkMemory, LibrariesTakeTheLargestOnesSize) {
     OpenPackage open(archive);
     bool good = true;
     for (const char* name : {"40", "60", "20", "50"}) {
-      good = open.apk.VerifyFileHash(name, folder / name) && good;
+      good = open.apk.VerifyFileHash(name, directory / name) && good;
     }
     return good;
   });

@@ -262,8 +262,8 @@ TEST(ProcessCertBounds, EveryChangeOfOneByteStaysInside) {
 }
 
 TEST(ProcessCert, BlockMadeByOpensslIsRead) {
-  const TempDir folder;
-  const std::string base = folder / "block";
+  const TempDir directory;
+  const std::string base = directory / "block";
   const std::string key = TestKeyPath("rsa-2048");
   WriteFile(base + ".sf", kSignatureFile);
   const std::string command = "openssl req -x509 -new -key " + key + " -subj /CN=Test -out " +

@@ -15,12 +15,12 @@
 
 namespace {
 
-constexpr char kFolder[] = "/usr/share/ca-certificates";
+constexpr char kDirectory[] = "/usr/share/ca-certificates";
 
 std::vector<std::string> CertificateFiles() {
   std::vector<std::string> files;
   std::error_code error;
-  for (const auto& entry : std::filesystem::recursive_directory_iterator(kFolder, error)) {
+  for (const auto& entry : std::filesystem::recursive_directory_iterator(kDirectory, error)) {
     if (entry.path().extension() == ".crt") files.push_back(entry.path());
   }
   std::sort(files.begin(), files.end());
@@ -189,7 +189,7 @@ void ExpectAsOpensslReads(const x509_certificate& cert, const std::vector<std::s
 
 TEST(X509Authorities, EveryCertificateReadsAsOpensslReadsIt) {
   const std::vector<std::string> files = CertificateFiles();
-  ASSERT_FALSE(files.empty()) << "no certificates in " << kFolder;
+  ASSERT_FALSE(files.empty()) << "no certificates in " << kDirectory;
   uint32_t extensions_seen = 0;
   for (const std::string& file : files) {
     SCOPED_TRACE(file);

@@ -43,12 +43,12 @@ class KeptStandardError {
   const int saved_;
 };
 
-// A file installed in a folder of its own, and the phone that it is installed on.
+// A file installed in a directory of its own, and the phone that it is installed on.
 class Installed {
  public:
   explicit Installed(const Package& package, bool is_trusted = false) {
-    file_ = folder_.Write("app/base.apk", package.Build());
-    folder_.Write("app/lib/arm64/libfoo.so", ToBytes("\177ELF foo"));
+    file_ = directory_.Write("app/base.apk", package.Build());
+    directory_.Write("app/lib/arm64/libfoo.so", ToBytes("\177ELF foo"));
     struct stat state = {};
     if (is_trusted && stat(file_.c_str(), &state) == 0) {
       phone_.trusted = {{state.st_dev, state.st_ino}};
@@ -66,22 +66,22 @@ class Installed {
 
   // Runs the tool with the fault, such as "open:1".
   Outcome Run(const std::string& fault) {
-    std::filesystem::remove(folder_ / "report");
-    std::filesystem::remove(folder_ / "journal");
-    phone_.journal = folder_ / "journal";
+    std::filesystem::remove(directory_ / "report");
+    std::filesystem::remove(directory_ / "journal");
+    phone_.journal = directory_ / "journal";
     ToolCommand command = {
         {}, TOOL_PATH, file_, FAULT_INJECTOR ":" KERNEL_STAND_IN, SettingsToEnvironment(phone_)};
     if (AreProgramsEmulated()) command.runner = Split(APKTOOLKIT_RUNNER, ' ');
     command.environment.push_back("APKTOOLKIT_FAULT=" + fault);
-    command.environment.push_back("APKTOOLKIT_FAULT_REPORT=" + folder_ / "report");
+    command.environment.push_back("APKTOOLKIT_FAULT_REPORT=" + directory_ / "report");
     Outcome outcome;
     {
-      const KeptStandardError kept(folder_ / "errors");
+      const KeptStandardError kept(directory_ / "errors");
       outcome.ending = RunTool(command, Deadline(20));
     }
-    outcome.failed = std::filesystem::exists(folder_ / "report");
+    outcome.failed = std::filesystem::exists(directory_ / "report");
     outcome.grants = Grants(ContentOf(phone_.journal), file_);
-    outcome.errors = ContentOf(folder_ / "errors");
+    outcome.errors = ContentOf(directory_ / "errors");
     return outcome;
   }
 
@@ -109,7 +109,7 @@ class Installed {
     return payload == "0000" && !is_library ? "J" : "?";
   }
 
-  TempDir folder_;
+  TempDir directory_;
   PhoneSettings phone_;
   std::string file_;
 };
@@ -164,7 +164,7 @@ TEST(FaultsOfCalls, CostAGoodPackageWhatTheyAreFor) {
               {"read", {"PK"}},               // the library
               {"fopen", {"PK", "LK"}},        // the own integrity value, before each signing
               {"fcntl", {"PK", "PK", "LK"}},  // the library kept open; the signings
-              {"readlink", {"PK", "LPK"}},    // the libraries' folder; a message
+              {"readlink", {"PK", "LPK"}},    // the libraries' directory; a message
               {"fstatvfs", {"LPK"}},          // a file system that counts as writable
               {"fgetxattr", {}}});            // JARs alone have attributes
 }

@@ -24,10 +24,10 @@ RunResult Shell(const std::string& script, const std::string& file = "/dev/null"
 
 // What the script prints.
 std::string Printed(const std::string& script, const RunLimits& limits = {}) {
-  const TempDir folder;
-  const RunResult run = Shell(script, folder / "output", limits);
+  const TempDir directory;
+  const RunResult run = Shell(script, directory / "output", limits);
   EXPECT_EQ(run.end, RunEnd::kExited);
-  return ContentOf(folder / "output");
+  return ContentOf(directory / "output");
 }
 
 void Expect(const RunResult& run, RunEnd end, int value) {
@@ -43,8 +43,8 @@ TEST(RunProgram, TellsTheExitStatus) {
 
 TEST(RunProgram, HandsOverEachArgument) {
   EXPECT_EQ(Printed("echo \"$#\""), "0\n");
-  const TempDir folder;
-  const std::string file = folder / "output";
+  const TempDir directory;
+  const std::string file = directory / "output";
   RunProgram({"/bin/sh", "-c", "printf '%s|' \"$@\" >\"$0\"", file, "a b", "", "*"}, {});
   EXPECT_EQ(ContentOf(file), "a b||*|");
 }
@@ -78,8 +78,8 @@ TEST(RunProgram, ThatIsNotThereIsNotStarted) {
 
 // What the standard streams of a shell are, before it redirects anything.
 std::string Streams() {
-  const TempDir folder;
-  const std::string file = folder / "output";
+  const TempDir directory;
+  const std::string file = directory / "output";
   const char script[] =
       "streams=$(readlink /proc/$$/fd/0 /proc/$$/fd/1 /proc/$$/fd/2); echo \"$streams\" >\"$0\"";
   RunProgram({"/bin/sh", "-c", script, file}, {});
@@ -109,8 +109,8 @@ TEST(RunProgram, HasNoSignalBlocked) {
   sigemptyset(&some);
   sigaddset(&some, SIGTERM);
   pthread_sigmask(SIG_BLOCK, &some, &before);
-  const TempDir folder;
-  const std::string file = folder / "status";
+  const TempDir directory;
+  const std::string file = directory / "status";
   RunProgram({"/bin/cp", "/proc/self/status", file}, {});
   pthread_sigmask(SIG_SETMASK, &before, nullptr);
   EXPECT_NE(ContentOf(file).find("\nSigBlk:\t0000000000000000\n"), std::string::npos);

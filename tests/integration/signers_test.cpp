@@ -62,12 +62,12 @@ constexpr int kNotStarted = 5;
 // A package whose signers differ: another's META-INF, dex and libraries below one's own block.
 class PackageWithTwoFaces : public testing::Test {
  protected:
-  PackageWithTwoFaces() : apk_(folder_ / "base.apk") {
+  PackageWithTwoFaces() : apk_(directory_ / "base.apk") {
     const std::string victims = std::string(THREAT_PACKAGES) + "/foreign/base.apk";
     WriteFile(apk_, AddSigningBlock(ToBytes(ContentOf(victims)), "rsa-2048-other"));
   }
 
-  TempDir folder_;
+  TempDir directory_;
   const std::string apk_;
 };
 
@@ -132,8 +132,8 @@ TEST(Signers, RetiredKeyIsNoSigner) {
 
 // As the tool does it: the signer of a leased package is looked at once the holder gives it up.
 TEST(Signers, OfALeasedPackageAreWaitedFor) {
-  const TempDir folder;
-  const std::string apk = folder / "base.apk";
+  const TempDir directory;
+  const std::string apk = directory / "base.apk";
   fs::copy_file(Golden("apksigner-sha256-2048/base.apk"), apk);
   const Lease lease(apk);
   if (!lease.IsHeld()) GTEST_SKIP() << "the file system of " << apk << " knows no leases";
@@ -148,16 +148,16 @@ TEST(Signers, ThatAreNotRsaHaveNoDigest) {
 }
 
 TEST(Signers, OfFilesWithoutAJarSignatureThatHoldsAreNone) {
-  const TempDir folder;
-  const std::string text = folder.Write("text", ToBytes("no archive"));
+  const TempDir directory;
+  const std::string text = directory.Write("text", ToBytes("no archive"));
   PackageOptions jar;
   jar.android_manifest = Bytes();
-  MakePackage(jar).WriteTo(folder / "plain.jar");
+  MakePackage(jar).WriteTo(directory / "plain.jar");
   const std::string key = DigestOfKey("apksigner-sha256-2048");
   for (const std::string& file :
        {Golden("apksigner-newer-only/base.apk"), Golden("unsigned.apk"),
         Golden("jarsigner-sha256/base.apk"), Golden("openssl-cms-issued/base.apk"), text,
-        folder / "plain.jar", folder / "missing", folder.path()}) {
+        directory / "plain.jar", directory / "missing", directory.path()}) {
     ExpectNotRun(kNoJarSigner, key, file);
     ExpectNotRun(kNoJarSigner, "", file);
   }

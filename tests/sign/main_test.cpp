@@ -36,11 +36,11 @@ TEST(Main, WithoutStandardInputTheFileIsLeftAlone) {
 }
 
 TEST(Main, AFifoIsNoArchiveAndNothingToWaitFor) {
-  const TempDir folder;
-  ASSERT_EQ(mkfifo((folder / "fifo").c_str(), 0600), 0);
-  const ProcessResult run = RunTool("timeout 20 \"$0\" \"$1\" </dev/null", folder / "fifo");
+  const TempDir directory;
+  ASSERT_EQ(mkfifo((directory / "fifo").c_str(), 0600), 0);
+  const ProcessResult run = RunTool("timeout 20 \"$0\" \"$1\" </dev/null", directory / "fifo");
   EXPECT_EQ(run.status, 0);
-  EXPECT_TRUE(Says(run, "OpenArchiveFd(3) [file: " + folder / "fifo" + "] returned: "))
+  EXPECT_TRUE(Says(run, "OpenArchiveFd(3) [file: " + directory / "fifo" + "] returned: "))
       << run.errors;
   EXPECT_TRUE(Says(run, "Zip archive is not valid for fd=3")) << run.errors;
 }

@@ -37,9 +37,9 @@ bool Redirect(int number, const std::string& path, int flags) {
 }  // namespace
 
 ProcessResult RunProcess(const std::vector<std::string>& command, const std::string& directory) {
-  const TempDir folder;
-  const std::string output = folder / "output";
-  const std::string errors = folder / "errors";
+  const TempDir streams;
+  const std::string output = streams / "output";
+  const std::string errors = streams / "errors";
   const pid_t child = fork();
   if (child == 0) Become(command, directory, output, errors);
   int status = 0;

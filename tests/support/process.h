@@ -10,7 +10,7 @@ struct ProcessResult {
   std::string errors;
 };
 
-// Runs a program, found through PATH when its name has no "/", in the folder `directory` (empty: in
-// this one).
+// Runs a program, found through PATH when its name has no "/", in the directory `directory` (empty:
+// in this one).
 ProcessResult RunProcess(const std::vector<std::string>& command,
                          const std::string& directory = {});

@@ -13,7 +13,7 @@ struct Simulation {
 // fails, or that writes anything on standard error, is a test failure.
 Simulation Simulate(const std::string& file, const std::vector<std::string>& options = {});
 
-// The same with more control: the whole command up to the simulator's options, and the folder.
+// The same with more control: the whole command up to the simulator's options, and the directory.
 struct Start {
   std::vector<std::string> before;  // such as {"unshare", "-m"}
   std::string directory;
@@ -22,7 +22,7 @@ Simulation Simulate(const std::string& file, const std::vector<std::string>& opt
                     const Start& start);
 
 // The first lines that a person sees who reads UTF-8 and runs the simulator with these words in the
-// folder `directory`; and its exit status, as a last line "-> STATUS".
+// directory `directory`; and its exit status, as a last line "-> STATUS".
 std::vector<std::string> FirstLines(size_t count, const std::vector<std::string>& words,
                                     const Start& start);
 

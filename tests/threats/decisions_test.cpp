@@ -15,14 +15,14 @@ namespace {
 
 // The made package of the victim, its signature block exchanged for a forged one.
 Bytes WithForgedBlock(const Bytes& exponent) {
-  const TempDir folder;
-  const std::string apk = folder.Write("base.apk", Made("victim"));
+  const TempDir directory;
+  const std::string apk = directory.Write("base.apk", Made("victim"));
   const std::string entry = "META-INF/CERT.SF";
-  EXPECT_EQ(RunProcess({"unzip", "-q", apk, entry, "-d", folder.path()}).status, 0);
-  const Bytes signature_file = ToBytes(ContentOf(folder / entry));
-  folder.Write("META-INF/CERT.RSA", ForgedBlock(signature_file, "rsa-2048", exponent));
+  EXPECT_EQ(RunProcess({"unzip", "-q", apk, entry, "-d", directory.path()}).status, 0);
+  const Bytes signature_file = ToBytes(ContentOf(directory / entry));
+  directory.Write("META-INF/CERT.RSA", ForgedBlock(signature_file, "rsa-2048", exponent));
   EXPECT_EQ(RunProcess({"aapt", "remove", apk, "META-INF/CERT.RSA"}).status, 0);
-  EXPECT_EQ(RunProcess({"aapt", "add", apk, "META-INF/CERT.RSA"}, folder.path()).status, 0);
+  EXPECT_EQ(RunProcess({"aapt", "add", apk, "META-INF/CERT.RSA"}, directory.path()).status, 0);
   return ToBytes(ContentOf(apk));
 }
 
@@ -110,7 +110,7 @@ TEST_F(ExchangedLibrary, ForAFifoIsRefusedWithoutWaiting) {
   });
 }
 
-TEST_F(ExchangedLibrary, ForAFolderIsRefused) {
+TEST_F(ExchangedLibrary, ForADirectoryIsRefused) {
   ExpectRefused([this] {
     Remove();
     EXPECT_EQ(mkdir(target_.c_str(), 0700), 0);

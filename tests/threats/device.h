@@ -31,7 +31,7 @@ class Device {
   explicit Device(const Bytes& archive) : path_(temp_.Write("app/base.apk", archive)) {}
   explicit Device(const Package& package) : Device(package.Build()) {}
 
-  // Puts the bytes on disk, at a path from the package's folder on.
+  // Puts the bytes on disk, at a path from the package's directory on.
   Device& Install(const std::string& path, const Bytes& content) {
     temp_.Write("app/" + path, content);
     return *this;
@@ -39,8 +39,8 @@ class Device {
   // The same path, of the file system.
   std::string Path(const std::string& path) const { return temp_ / ("app/" + path); }
 
-  // The names, from the folder above the package's on, of the files that were signed with the key
-  // of `signer`, in their order.
+  // The names, from the directory above the package's on, of the files that were signed with the
+  // key of `signer`, in their order.
   Strings FilesSignedFor(const std::string& signer) {
     const std::string payload = "2000" + Hex(DigestOf(Digest::kSha256, ModulusOf(signer)));
     return FilesSignedWith(payload);

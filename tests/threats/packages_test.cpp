@@ -21,10 +21,10 @@ std::string Made(const std::string& name) {
 // Both libraries of the package and the package itself signed for the key, then the key registered.
 std::string AllSignedAndRegistered(const std::string& apk, const std::string& key,
                                    const std::string& name) {
-  const std::string folder = std::filesystem::path(apk).parent_path();
+  const std::string directory = std::filesystem::path(apk).parent_path();
   const Bytes payload = PackagePayload(key);
-  return Timeline({LibraryStep({SignedLibrary(folder + "/lib/arm64/libvault.so", payload),
-                                SignedLibrary(folder + "/lib/arm/libvault.so", payload)}),
+  return Timeline({LibraryStep({SignedLibrary(directory + "/lib/arm64/libvault.so", payload),
+                                SignedLibrary(directory + "/lib/arm/libvault.so", payload)}),
                    PackageStep(apk, payload), Register(3, apk, name, ModulusOf(key)),
                    Log(4, "ZuAddCertificate: ZuNewCertificate return 0.\n"), Exit(0)});
 }
@@ -54,13 +54,13 @@ INSTANTIATE_TEST_SUITE_P(Rsa, KeyOfApksigner,
 class ForeignMetaInf : public testing::TestWithParam<const char*> {
  protected:
   // The made package below the attacker's own signing block, its libraries beside it.
-  ForeignMetaInf() : apk_(folder_ / "base.apk") {
+  ForeignMetaInf() : apk_(directory_ / "base.apk") {
     std::filesystem::copy(std::filesystem::path(Made(GetParam())).parent_path() / "lib",
-                          folder_ / "lib", std::filesystem::copy_options::recursive);
+                          directory_ / "lib", std::filesystem::copy_options::recursive);
     WriteFile(apk_, AddSigningBlock(ToBytes(ContentOf(Made(GetParam()))), "rsa-2048-other"));
   }
 
-  TempDir folder_;
+  TempDir directory_;
   const std::string apk_;
 };
 
@@ -86,9 +86,9 @@ INSTANTIATE_TEST_SUITE_P(Around, ForeignMetaInf, testing::Values("foreign", "no-
 // The twin: around one's own META-INF nothing of the victim's is to be had.
 TEST(OwnMetaInf, GetsItsOwnPayload) {
   const std::string apk = Made("keys/rsa-2048-other");
-  TempDir folder;
-  const std::string signed_again = folder / "base.apk";
-  std::filesystem::copy(std::filesystem::path(apk).parent_path() / "lib", folder / "lib",
+  TempDir directory;
+  const std::string signed_again = directory / "base.apk";
+  std::filesystem::copy(std::filesystem::path(apk).parent_path() / "lib", directory / "lib",
                         std::filesystem::copy_options::recursive);
   WriteFile(signed_again, AddSigningBlock(ToBytes(ContentOf(apk)), "rsa-2048-other"));
   EXPECT_EQ(Simulate(signed_again).timeline,

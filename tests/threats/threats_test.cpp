@@ -51,11 +51,11 @@ Package WithTwoSigners(const Strings& certificates, const Strings& signers) {
 }
 
 bool IsVerifiedByOpenssl(Package package) {
-  const TempDir folder;
-  folder.Write("block", package.Item("META-INF/CERT.RSA").data);
-  folder.Write("file", package.Item("META-INF/CERT.SF").data);
+  const TempDir directory;
+  directory.Write("block", package.Item("META-INF/CERT.RSA").data);
+  directory.Write("file", package.Item("META-INF/CERT.SF").data);
   return RunProcess({"openssl", "cms", "-verify", "-noverify", "-binary", "-inform", "DER", "-in",
-                     folder / "block", "-content", folder / "file", "-out", "/dev/null"})
+                     directory / "block", "-content", directory / "file", "-out", "/dev/null"})
              .status == 0;
 }
 

@@ -81,10 +81,10 @@ class FileTest : public testing::Test {
     alarm(0);
   }
 
-  std::string Path(const std::string& name) const { return folder_ / name; }
+  std::string Path(const std::string& name) const { return directory_ / name; }
 
   std::string MakeFile(const std::string& content) const {
-    return folder_.Write("file", ToBytes(content));
+    return directory_.Write("file", ToBytes(content));
   }
 
   // `path` cannot be read, which is told by `message` alone, and `out` stays as it is.
@@ -99,7 +99,7 @@ class FileTest : public testing::Test {
     ExpectRefused(path, "Can't read file: " + path + " (streamoff=-1)\n");
   }
 
-  TempDir folder_;
+  TempDir directory_;
 };
 using ReadFileTest = FileTest;
 using OpenForReadingTest = FileTest;
@@ -163,7 +163,7 @@ TEST_F(ReadFileTest, SocketCannotBeOpened) {
   close(fd);
 }
 
-TEST_F(ReadFileTest, DirectoryHasNoSize) { ExpectNoSize(folder_.path()); }
+TEST_F(ReadFileTest, DirectoryHasNoSize) { ExpectNoSize(directory_.path()); }
 
 TEST_F(ReadFileTest, DeviceHasNoSize) { ExpectNoSize("/dev/zero"); }
 
@@ -298,7 +298,7 @@ TEST_F(ReadFileTest, NoDescriptorStaysOpen) {
   const int before = NextDescriptor();
   Bytes out;
   EXPECT_TRUE(ReadFile(MakeFile("abc"), out));
-  ExpectNoSize(folder_.path());
+  ExpectNoSize(directory_.path());
   EXPECT_EQ(before, NextDescriptor());
 }
 
@@ -375,7 +375,7 @@ TEST_F(ReadFileTest, DescriptorIsReadFromItsStartWhateverThePathLeadsTo) {
 }
 
 TEST_F(ReadFileTest, DescriptorOfADirectoryHasNoSizeAndStaysOpen) {
-  const int fd = open(folder_.path().c_str(), O_RDONLY | O_DIRECTORY | O_CLOEXEC);
+  const int fd = open(directory_.path().c_str(), O_RDONLY | O_DIRECTORY | O_CLOEXEC);
   LogCapture log;
   Bytes out;
   EXPECT_FALSE(ReadFile("its name", out, nullptr, fd));
@@ -473,7 +473,7 @@ TEST_F(ReadFileTest, LeavesTheStateAloneWhenItFails) {
   Bytes out;
   struct stat read = {};
   read.st_ino = 7;
-  EXPECT_FALSE(ReadFile(folder_.path(), out, &read));
+  EXPECT_FALSE(ReadFile(directory_.path(), out, &read));
   EXPECT_FALSE(ReadFile("/nowhere/file", out, &read));
   EXPECT_EQ(read.st_ino, 7u);
 }
@@ -509,13 +509,13 @@ TEST(IsSameFile, WhatIsNoRegularFileIsNone) {
 }
 
 TEST_F(GetFilenameByFdTest, TargetPathOf4094BytesIsWhole) {
-  const DeepDirectory deep(folder_.path(), 4094);
+  const DeepDirectory deep(directory_.path(), 4094);
   ASSERT_NE(-1, deep.fd());
   EXPECT_EQ(deep.path(), GetFilenameByFd(deep.fd()));
 }
 
 TEST_F(GetFilenameByFdTest, TargetPathOf4095BytesIsItsFirst4095Bytes) {
-  const DeepDirectory deep(folder_.path(), 4095);
+  const DeepDirectory deep(directory_.path(), 4095);
   ASSERT_NE(-1, deep.fd());
   EXPECT_EQ(4095U, GetFilenameByFd(deep.fd()).size());
   EXPECT_EQ(deep.path(), GetFilenameByFd(deep.fd()));
@@ -523,7 +523,7 @@ TEST_F(GetFilenameByFdTest, TargetPathOf4095BytesIsItsFirst4095Bytes) {
 
 // Linux does not tell a longer path at all: readlink fails with ENAMETOOLONG.
 TEST_F(GetFilenameByFdTest, TargetPathOf4096BytesIsNotToldByTheKernel) {
-  const DeepDirectory deep(folder_.path(), 4096);
+  const DeepDirectory deep(directory_.path(), 4096);
   ASSERT_NE(-1, deep.fd());
   EXPECT_EQ("", GetFilenameByFd(deep.fd()));
 }
