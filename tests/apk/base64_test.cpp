@@ -10,7 +10,8 @@
 
 namespace {
 
-// What base64decode() makes of `text` with `room` bytes to write to; memory ends behind both.
+// The result of base64decode() for `text` and `room` bytes of output. Memory ends behind both
+// buffers.
 struct Decoded {
   int result;
   size_t length;
@@ -91,7 +92,8 @@ TEST(Base64Decode, SpaceMakesItEmpty) {
   EXPECT_EQ(Bytes(), Base64Decode("QUJD "));
 }
 
-// Every byte alone behind a whole group: skipped, the end, a left-over value, or refused.
+// Each byte, alone after a whole group, is skipped, ends the text, is a left-over value, or is
+// refused.
 TEST(Base64Decode, EveryByteOutsideTheAlphabetIsRefused) {
   const std::string accepted =
       "ABCDEFGHIJKLMNOPQRSTUVWXYZabcdefghijklmnopqrstuvwxyz0123456789+/=\r\n" + std::string(1, 0);
@@ -104,7 +106,7 @@ TEST(Base64Decode, EveryByteOutsideTheAlphabetIsRefused) {
   }
 }
 
-// The alphabet in its order: values 0, 1, 2, 3 are 000000 000001 000010 000011, and so on.
+// The alphabet in order: values 0, 1, 2, 3 are 000000 000001 000010 000011, and so on.
 TEST(Base64Decode, TheAlphabetCountsFromZeroToSixtyThree) {
   Bytes expected;
   for (int value = 0; value < 64; value += 4) {

@@ -114,7 +114,7 @@ TEST(InitCertSf, BlocksOfOtherKindsAreNotLookedFor) {
   }
 }
 
-// The library's order of entries is its own; which comes first is asked of it.
+// The library has its own order of entries, so it is asked which comes first.
 TEST(InitCertSf, OfTwoSignersTheFirstInTheArchivesOrderDecides) {
   PackageOptions options;
   options.base_name = "META-INF/OTHER";
@@ -253,7 +253,7 @@ TEST(ValidateManifest, ANameThatIsTheSuffixAloneIsAMatchWithoutAnAlgorithm) {
                      Error("Can't validate manifest.\n"), Error("Can't validate manifest.\n")}));
 }
 
-// An empty expected digest is no digest to compare with, of whatever kind.
+// An empty expected digest is refused before its algorithm is looked at.
 TEST(ValidateManifest, AnEmptyMd5DigestIsRefusedWithoutASayingOnMd5) {
   EXPECT_EQ(LogOf(WithSignatureFile("MD5-Digest-Manifest: ====\r\n\r\n")),
             Records({Error("Can't validate manifest.\n"), Error("Can't validate manifest.\n")}));

@@ -19,7 +19,7 @@ namespace {
   abort();
 }
 
-// The one that the environment names, a workstation's, or a phone's.
+// The directory that the environment names, a workstation's, or a phone's.
 std::string TemporaryDirectory() {
   if (const char* const named = getenv("TMPDIR"); named != nullptr) return named;
   return access("/tmp", W_OK) == 0 ? "/tmp" : "/data/local/tmp";
@@ -70,7 +70,7 @@ std::string ContentOf(const std::string& path) {
   return {std::istreambuf_iterator<char>(file), {}};
 }
 
-// The system call itself: the C library has no name for it before API level 30.
+// The system call itself: before API level 30 the C library has no function for it.
 MemoryFile::MemoryFile(const Bytes& content, const std::string& name)
     : fd_(static_cast<int>(syscall(SYS_memfd_create, name.c_str(), MFD_CLOEXEC))),
       path_("/memfd:" + name + " (deleted)") {
@@ -83,7 +83,7 @@ MemoryFile::MemoryFile(const Bytes& content, const std::string& name)
 
 MemoryFile::~MemoryFile() { close(fd_); }
 
-// Kept far above: the lowest free number may be one that another of these makes free.
+// Keeps the file under a number far above: another FreeDescriptor may free the lowest number.
 FreeDescriptor::FreeDescriptor(int fd) : fd_(fd), kept_(dup2(fd, 100 + fd)) { close(fd); }
 
 FreeDescriptor::~FreeDescriptor() {

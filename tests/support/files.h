@@ -1,5 +1,5 @@
-// Directories and files of a test's own, on disk and in memory, gone when the test is over. What
-// cannot be made aborts the program.
+// Directories and files of a test's own, on disk and in memory. They are removed when the test is
+// over. If one cannot be made, the program aborts.
 #pragma once
 
 #include <string>
@@ -9,19 +9,19 @@
 // A new empty directory.
 class TempDir {
  public:
-  // Below the directory for temporary files, or below `parent`.
+  // Makes it below the directory for temporary files, or below `parent`.
   explicit TempDir(const std::string& parent = {});
   ~TempDir();
   TempDir(const TempDir&) = delete;
   TempDir& operator=(const TempDir&) = delete;
 
-  // Resolved, without a "/" at the end.
+  // The resolved path, without a "/" at the end.
   const std::string& path() const { return path_; }
   // The path of `name` in the directory.
   std::string operator/(const std::string& name) const { return path_ + "/" + name; }
-  // The same, and makes the directories on the way to it.
+  // The same; also makes the directories above it.
   std::string File(const std::string& name) const;
-  // Writes a file, and makes the directories on the way to it. Returns its path.
+  // Writes a file, and makes the directories above it. Returns its path.
   std::string Write(const std::string& name, const Bytes& content) const;
 
  private:
@@ -30,7 +30,7 @@ class TempDir {
 
 void WriteFile(const std::string& path, const Bytes& content);
 
-// What the file holds; nothing when it cannot be read.
+// The file's content; empty if it cannot be read.
 std::string ContentOf(const std::string& path);
 
 // A file on disk, in a directory of its own.
@@ -53,7 +53,7 @@ class MemoryFile {
   MemoryFile& operator=(const MemoryFile&) = delete;
 
   int fd() const { return fd_; }
-  // What its descriptor resolves to.
+  // The path that its descriptor resolves to.
   std::string path() const { return path_; }
 
  private:

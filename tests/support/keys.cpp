@@ -11,8 +11,8 @@
 
 namespace {
 
-// On a phone the keys lie beside the program or, where a suite keeps programs of several processors
-// apart, one directory above it. (Not by readlink: tests have the linker wrap it.)
+// On a phone, the keys lie beside the program. A suite that separates programs by processor has
+// them one directory above. (Not found by readlink: tests have the linker wrap it.)
 std::string KeysDirectory() {
   const std::string keys = TEST_KEYS_DIR;
   if (keys[0] == '/') return keys;

@@ -27,7 +27,8 @@ bool Redirect(int number, const std::string& path, int flags) {
                      Redirect(STDOUT_FILENO, output, O_WRONLY | O_CREAT) &&
                      Redirect(STDERR_FILENO, errors, O_WRONLY | O_CREAT) &&
                      (directory.empty() || chdir(directory.c_str()) == 0);
-  // What this process was started with, such as ctest's log, would move the command's own numbers.
+  // Descriptors that this process inherited, such as ctest's log, would change the command's
+  // numbers.
   closefrom(STDERR_FILENO + 1);
   if (ready) execvp(arguments[0], arguments.data());
   perror(arguments[0]);
