@@ -1,5 +1,5 @@
-// The integers against GMP: at least 100,000 operands an operation, from limbs that provoke
-// carries.
+// The integers, compared with GMP: at least 100,000 operands per operation, made of limbs that
+// provoke carries.
 #include "crypto/mpi.h"
 
 #include <gtest/gtest.h>
@@ -402,7 +402,7 @@ TEST(Mpi, ReportsEachAllocationThatFails) {
     Number R;
     return mpi_mod_mpi(&R, &A, &B);
   });
-  // A remainder that is negative at first.
+  // The remainder is negative at first.
   const Number divisor({7, 0xffff});
   ExpectNoMemoryAtEveryAllocation([&] {
     Number R;

@@ -1,4 +1,4 @@
-// Names and times of a certificate.
+// The names and times of a certificate.
 #include <gtest/gtest.h>
 
 #include "crypto/parsed_certificate.h"
@@ -14,7 +14,7 @@ Certificate WithSubject(const Bytes& subject) {
   return certificate;
 }
 
-// A RelativeDistinguishedName of one attribute.
+// A RelativeDistinguishedName with one attribute.
 Bytes Rdn(const std::string& oid, const Bytes& value) {
   return der::Set({der::Sequence({der::Oid(oid), value})});
 }

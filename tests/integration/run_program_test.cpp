@@ -16,13 +16,13 @@
 
 namespace {
 
-// A shell that runs `script`; what it prints goes to the file $0.
+// A shell that runs `script`. Its output goes to the file $0.
 RunResult Shell(const std::string& script, const std::string& file = "/dev/null",
                 const RunLimits& limits = {}) {
   return RunProgram({"/bin/sh", "-c", "exec >\"$0\"; " + script, file}, limits);
 }
 
-// What the script prints.
+// The script's output.
 std::string Printed(const std::string& script, const RunLimits& limits = {}) {
   const TempDir directory;
   const RunResult run = Shell(script, directory / "output", limits);
@@ -76,7 +76,7 @@ TEST(RunProgram, ThatIsNotThereIsNotStarted) {
   Expect(RunProgram({"/dev/null"}, {}), RunEnd::kNotStarted, 0);
 }
 
-// What the standard streams of a shell are, before it redirects anything.
+// The standard streams of a shell before it redirects any.
 std::string Streams() {
   const TempDir directory;
   const std::string file = directory / "output";
@@ -93,7 +93,7 @@ TEST(RunProgram, HasNullForItsStreamsAndNothingElseOpen) {
   close(inherited);
 }
 
-// A daemon may have no streams of its own.
+// A daemon may not have standard streams.
 TEST(RunProgram, HasItsStreamsThoughThisProcessHasNone) {
   std::string streams;
   {
@@ -103,7 +103,7 @@ TEST(RunProgram, HasItsStreamsThoughThisProcessHasNone) {
   EXPECT_EQ(streams, "/dev/null\n/dev/null\n/dev/null\n");
 }
 
-// A shell would unblock them itself.
+// A shell would unblock signals itself.
 TEST(RunProgram, HasNoSignalBlocked) {
   sigset_t some, before;
   sigemptyset(&some);
@@ -139,7 +139,7 @@ TEST(RunProgram, WithoutDescriptorsIsNotStarted) {
   Expect(run, RunEnd::kNotStarted, EMFILE);
 }
 
-// Where SIGCHLD is ignored the kernel throws the status away.
+// While SIGCHLD is ignored, the kernel drops the status.
 TEST(RunProgram, WhoseStatusSomebodyElseTookIsLost) {
   const auto before = signal(SIGCHLD, SIG_IGN);
   Expect(RunProgram({"/bin/true"}, {}), RunEnd::kLost, ECHILD);

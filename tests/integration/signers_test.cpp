@@ -1,5 +1,5 @@
-// Binding the signers, on both sides: who signed, in the words of the package manager, and whether
-// apktoolkit goes by the same.
+// Binding the signers, on both sides: the package manager's signers, and whether apktoolkit finds
+// the same ones.
 #include <gtest/gtest.h>
 
 #include <filesystem>
@@ -37,7 +37,7 @@ std::string SignersOf(const std::string& apk, int level = 33) {
   return run.output.substr(0, run.output.find('\n'));
 }
 
-// The C++ side. The command that it may run tells that it ran.
+// The C++ side. The command prints that it ran.
 ProcessResult Bound(const std::string& digests, const std::string& file) {
   return RunProcess({APKTOOLKIT_BOUND_PATH, digests, "/bin/echo", "run for", file});
 }
@@ -59,7 +59,8 @@ constexpr int kOtherSigner = 3;
 constexpr int kNoJarSigner = 4;
 constexpr int kNotStarted = 5;
 
-// A package whose signers differ: another's META-INF, dex and libraries below one's own block.
+// A package with two different signers: the META-INF, dex and libraries are another's, below the
+// attacker's own signing block.
 class PackageWithTwoFaces : public testing::Test {
  protected:
   PackageWithTwoFaces() : apk_(directory_ / "base.apk") {
@@ -112,7 +113,7 @@ INSTANTIATE_TEST_SUITE_P(Of, OneSigner,
                            return name;
                          });
 
-// The tool goes by the first signature file, the package manager by all signers of the block.
+// The tool uses the first signature file, the package manager all signers of the block.
 TEST(Signers, OneOfSeveralIsEnough) {
   const std::string apk = Golden("two-signers/base.apk");
   const std::string digests = SignersOf(apk, 27);
@@ -122,7 +123,7 @@ TEST(Signers, OneOfSeveralIsEnough) {
   ExpectRun(DigestOfKey("openssl-cms-issued") + "," + DigestOfKey("apksigner-sha256-2048"), apk);
 }
 
-// From API level 28 on the package manager goes by the new key, the JAR signature is the old key's.
+// From API level 28 on the package manager uses the new key. The JAR signature is the old key's.
 TEST(Signers, RetiredKeyIsNoSigner) {
   const std::string apk = Golden("rotated-key/base.apk");
   EXPECT_EQ(SignersOf(apk, 33), DigestOfKey("openssl-cms-issued"));
@@ -130,7 +131,7 @@ TEST(Signers, RetiredKeyIsNoSigner) {
   ExpectRun(SignersOf(apk, 27), apk);
 }
 
-// As the tool does it: the signer of a leased package is looked at once the holder gives it up.
+// As in the tool: the signer of a leased package is read once the holder gives it up.
 TEST(Signers, OfALeasedPackageAreWaitedFor) {
   const TempDir directory;
   const std::string apk = directory / "base.apk";
@@ -163,7 +164,7 @@ TEST(Signers, OfFilesWithoutAJarSignatureThatHoldsAreNone) {
   }
 }
 
-// Only a whole digest counts, and no signer at all is no match.
+// Only a whole digest matches, and an empty list of signers never does.
 TEST(Signers, AreComparedWhole) {
   const std::string apk = Golden("apksigner-sha256-2048/base.apk");
   const std::string key = DigestOfKey("apksigner-sha256-2048");
@@ -190,7 +191,7 @@ TEST(Bound, LeavesNothingOpenForTheCommand) {
   EXPECT_EQ(run.output, "0\n1\n2\n3\n");  // 3 is the listing's own
 }
 
-// The tool finds descriptor 3 free, as when it is started by itself, and signs.
+// Descriptor 3 is free, as when the tool is started directly, and the tool signs.
 TEST(Bound, HasTheToolSign) {
   const std::string apk = Golden("apksigner-sha256-2048/base.apk");
   const ProcessResult run = RunProcess({APKTOOLKIT_BOUND_PATH, DigestOfKey("apksigner-sha256-2048"),

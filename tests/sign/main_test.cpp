@@ -1,5 +1,5 @@
-// What main does before and around the three steps, as a process without a phone: its log goes to
-// standard error there.
+// main before and around the three steps, as a process without a phone. Its log goes to standard
+// error.
 #include <gtest/gtest.h>
 #include <sys/stat.h>
 
@@ -11,7 +11,7 @@
 
 namespace {
 
-// Runs the tool by way of a shell, which gives it the file as $1 and is told what to do with it.
+// Runs the tool by a shell command, which gets the tool as $0 and the file as $1.
 ProcessResult RunTool(const std::string& command, const std::string& file) {
   return RunProcess({"sh", "-c", command, ToolPath(), file});
 }

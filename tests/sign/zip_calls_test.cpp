@@ -1,5 +1,5 @@
-// What the zip library is asked, where its answers do not tell. The linker sends the calls of the
-// tool here (CMakeLists.txt names them as the compiler does) and they go on to the library.
+// The calls to the zip library, because its answers do not show them. The linker sends the tool's
+// calls here (CMakeLists.txt has the compiler's names), and they go on to the library.
 #include <gtest/gtest.h>
 
 #include <algorithm>
@@ -18,11 +18,11 @@ namespace {
 constexpr int32_t kInvalidHandle = -4;  // the library's
 
 struct ZipCalls {
-  std::vector<bool> ownership;       // of the descriptors that archives were opened on
-  std::vector<std::string> filters;  // "PREFIX SUFFIX" of each iteration that was started
-  std::vector<void*> archives;       // and the archive that it was started on
-  std::vector<void*> open_cookies;   // of iterations that were started and not ended
-  bool no_iteration = false;         // none can be started, though there is an archive
+  std::vector<bool> ownership;       // whether archives own their descriptors
+  std::vector<std::string> filters;  // "PREFIX SUFFIX" of each started iteration
+  std::vector<void*> archives;       // the archive of each iteration
+  std::vector<void*> open_cookies;   // of iterations that have not ended
+  bool no_iteration = false;         // true: every start of an iteration fails
 } calls;
 
 template <typename Filter>

@@ -21,8 +21,8 @@ struct Start {
 Simulation Simulate(const std::string& file, const std::vector<std::string>& options,
                     const Start& start);
 
-// Runs the simulator with these words in `directory`, on a terminal for UTF-8. Returns the first
-// lines of its output, and its exit status as a last line "-> STATUS".
+// Runs the simulator with these words in the directory of `start`, in a locale of UTF-8. Returns
+// the first `count` lines of its output, and its exit status as a last line "-> STATUS".
 std::vector<std::string> FirstLines(size_t count, const std::vector<std::string>& words,
                                     const Start& start);
 

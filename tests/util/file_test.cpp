@@ -1,5 +1,5 @@
-// ReadFile and GetFilenameByFd against real files, and against a kernel that answers as a real file
-// would only by chance.
+// ReadFile and GetFilenameByFd with real files, and with kernel answers that real files give only
+// by chance.
 #include "util/file.h"
 
 #include <fcntl.h>
@@ -24,7 +24,7 @@
 #include "support/lease.h"
 #include "support/log_capture.h"
 
-// What a test has the kernel answer; where nothing is set, the kernel answers itself.
+// The answers that a test sets. The kernel itself answers if a test sets none.
 namespace {
 
 struct Kernel {
@@ -62,7 +62,7 @@ ssize_t __wrap_readlink(const char* path, char* buffer, size_t size) {
   return kernel.readlink ? kernel.readlink(buffer, size) : __real_readlink(path, buffer, size);
 }
 
-// What read and readlink are called in a build with _FORTIFY_SOURCE, as every platform tree has.
+// The names of read and readlink in a build with _FORTIFY_SOURCE, as in every platform tree.
 ssize_t __wrap___read_chk(int fd, void* buffer, size_t size, size_t /*room*/) {
   return __wrap_read(fd, buffer, size);
 }
@@ -75,7 +75,7 @@ namespace {
 
 class FileTest : public testing::Test {
  protected:
-  void SetUp() override { alarm(60); }  // whoever waits for a FIFO is ended
+  void SetUp() override { alarm(60); }  // ends a test that waits for a FIFO
   void TearDown() override {
     kernel = Kernel();
     alarm(0);
@@ -87,7 +87,7 @@ class FileTest : public testing::Test {
     return directory_.Write("file", ToBytes(content));
   }
 
-  // `path` cannot be read, which is told by `message` alone, and `out` stays as it is.
+  // `path` cannot be read; only `message` is logged, and `out` is unchanged.
   static void ExpectRefused(const std::string& path, const std::string& message) {
     LogCapture log;
     Bytes out = {1, 2, 3};
@@ -221,7 +221,7 @@ TEST_F(ReadFileTest, FileThatCannotBeRewoundHasNoSize) {
   ExpectNoSize(MakeFile("abc"));
 }
 
-// As of a file that grows or shrinks between the two questions.
+// Like a file that grows or shrinks between the two calls.
 TEST_F(ReadFileTest, SizeIsWhereTheFileEndsAndNotWhatItsStateSays) {
   for (const off_t end : {off_t{2}, off_t{5}}) {
     kernel.lseek = [end](int whence) { return whence == SEEK_END ? end : off_t{0}; };
@@ -290,7 +290,7 @@ TEST_F(ReadFileTest, PiecewiseAndInterruptedReadsAreJoined) {
   Bytes out;
   EXPECT_TRUE(ReadFile(MakeFile("abcdefg"), out));
   EXPECT_EQ(ToBytes("abcdefg"), out);
-  // Never for more than there is room for.
+  // No read asks for more bytes than there is room for.
   EXPECT_EQ(std::vector<size_t>({7, 7, 5, 5, 3, 3, 1, 1}), asked);
 }
 
@@ -324,14 +324,14 @@ TEST_F(GetFilenameByFdTest, ClosedDescriptorHasNone) {
   EXPECT_EQ(Records(), log.records());
 }
 
-// Directories within directories, each made and opened from the one above, since the path of the
-// last is longer than a path may be. Removes them again.
+// Nested directories, each made and opened from the one above, because the path of the last is
+// longer than a path may be. They are removed at the end.
 class DeepDirectory {
  public:
   DeepDirectory(const std::string& top, size_t path_length) {
     fds_.push_back(open(top.c_str(), O_RDONLY | O_DIRECTORY | O_CLOEXEC));
     for (size_t length = top.size(); length < path_length;) {
-      // A remainder of one byte would have room for a slash alone.
+      // A remainder of one byte would only have room for a slash.
       size_t step = std::min<size_t>(path_length - length, 200);
       if (path_length - length - step == 1) --step;
       names_.push_back(std::string(step - 1, 'd'));
@@ -385,7 +385,7 @@ TEST_F(ReadFileTest, DescriptorOfADirectoryHasNoSizeAndStaysOpen) {
 
 // ---- Its memory.
 
-// That the former memory is gone by then, tests/apk/memory_test.cpp tells.
+// tests/apk/memory_test.cpp checks that the former memory is freed first.
 TEST_F(ReadFileTest, EmptyVectorGetsNoMoreMemoryThanTheFileNeeds) {
   Bytes out(1000);
   out.clear();
@@ -403,7 +403,7 @@ TEST_F(ReadFileTest, EmptyVectorWithMemoryEnoughKeepsIt) {
   EXPECT_EQ(Bytes(1000, 'x'), out);
 }
 
-// ---- Without waiting for a writer, and with waiting for whoever holds a lease.
+// ---- Without waiting for a writer, but with waiting for the holder of a lease.
 
 TEST_F(OpenForReadingTest, FifoNeverWouldBlockForReading) {
   ASSERT_EQ(0, mkfifo(Path("fifo").c_str(), 0600));
@@ -450,7 +450,7 @@ TEST_F(OpenForReadingTest, TellsWhyAFileIsNotOpened) {
   EXPECT_EQ(ENOENT, errno);
 }
 
-// ---- Which file it is.
+// ---- The identity of the file.
 
 TEST_F(ReadFileTest, TellsTheFilesStateBeforeAByteWasRead) {
   const std::string path = MakeFile("abc");
@@ -500,7 +500,7 @@ TEST(IsSameFile, EachPartOfTheStateCounts) {
   }
 }
 
-// Neither is a regular file, alike as they may be.
+// Both states are equal, but not those of a regular file.
 TEST(IsSameFile, WhatIsNoRegularFileIsNone) {
   struct stat state = {};
   EXPECT_FALSE(IsSameFile(state, state));
@@ -521,7 +521,7 @@ TEST_F(GetFilenameByFdTest, TargetPathOf4095BytesIsItsFirst4095Bytes) {
   EXPECT_EQ(deep.path(), GetFilenameByFd(deep.fd()));
 }
 
-// Linux does not tell a longer path at all: readlink fails with ENAMETOOLONG.
+// Linux does not return a longer path at all: readlink fails with ENAMETOOLONG.
 TEST_F(GetFilenameByFdTest, TargetPathOf4096BytesIsNotToldByTheKernel) {
   const DeepDirectory deep(directory_.path(), 4096);
   ASSERT_NE(-1, deep.fd());

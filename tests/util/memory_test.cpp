@@ -22,7 +22,7 @@ TEST(FitsInMemory, AllOfTheMachineAndMoreDoNot) {
   EXPECT_FALSE(FitsInMemory(SIZE_MAX));
 }
 
-// The addresses that the process has taken, in bytes.
+// The address space that the process uses, in bytes.
 size_t AddressesTaken() {
   size_t pages = 0;
   std::ifstream("/proc/self/statm") >> pages;
