@@ -55,7 +55,7 @@ bool Asks(const std::string& element, const std::vector<XmlAttribute>& attribute
 
 // ---- The package's name.
 
-TEST(AndroidManifestPackage, ItIsTheManifestsAttributeInEitherEncoding) {
+TEST(AndroidManifestPackage, TheNameIsTheManifestsAttributeInEitherEncoding) {
   for (const auto pool : {CompiledXml::Pool::kUtf8, CompiledXml::Pool::kUtf16}) {
     EXPECT_EQ(Read(CompiledXml(pool).Element("manifest",
                                              {Package("com.example.\u00fc\u20ac\U0001f600")})),
@@ -100,12 +100,12 @@ TEST(AndroidManifestPackage, AManifestCountsAtAnyDepth) {
             (Facts{"deep", false}));
 }
 
-TEST(AndroidManifestPackage, AReferenceIsNoName) {
+TEST(AndroidManifestPackage, AReferenceIsNotAName) {
   EXPECT_EQ(Read(CompiledXml().Element("manifest", {ReferenceAttribute("package", 0x7f010001)})),
             (Facts{"", false}));
 }
 
-TEST(AndroidManifestPackage, AnIntegerIsNoName) {
+TEST(AndroidManifestPackage, AnIntegerIsNotAName) {
   EXPECT_EQ(Read(CompiledXml().Element("manifest", {IntAttribute("package", 17)})),
             (Facts{"", false}));
 }
@@ -117,7 +117,7 @@ TEST(AndroidManifestPackage, OtherLetterCaseIsAnotherElementOrAttribute) {
             (Facts{"", false}));
 }
 
-TEST(AndroidManifestPackage, ADocumentWithoutManifestHasNone) {
+TEST(AndroidManifestPackage, ADocumentWithoutManifestHasNoName) {
   EXPECT_EQ(Read(CompiledXml().Element("resources")), (Facts{"", false}));
 }
 
@@ -228,7 +228,7 @@ TEST(AndroidManifestAttribute, AStringWithoutTextIsPassedOverForALaterString) {
 }
 
 // The raw value is the text in the source. The typed value, to which it was compiled, counts.
-TEST(AndroidManifestAttribute, WhatIsNoStringIsMissingThoughItHasARawText) {
+TEST(AndroidManifestAttribute, AnAttributeOfAnotherTypeIsMissingEvenWithARawText) {
   for (XmlAttribute attribute :
        {ReferenceAttribute("package", 0x7f010000), IntAttribute("package", 7)}) {
     attribute.has_raw = true;
@@ -237,7 +237,7 @@ TEST(AndroidManifestAttribute, WhatIsNoStringIsMissingThoughItHasARawText) {
   }
 }
 
-TEST(AndroidManifestAttribute, OneWithoutANameIsPassedOver) {
+TEST(AndroidManifestAttribute, AnAttributeWithoutANameIsPassedOver) {
   XmlAttribute nameless = Package("wrong");
   nameless.has_name = false;
   EXPECT_EQ(Read(CompiledXml().Element("manifest", {nameless, Package("right")})),
@@ -287,7 +287,7 @@ TEST(AndroidManifestSurrogates, AreDroppedFromNamesAndValuesAsByTheConversion) {
   }
 }
 
-TEST(AndroidManifestSurrogates, AShorterNameIsAnotherHoweverManyAreInIt) {
+TEST(AndroidManifestSurrogates, AShorterNameDoesNotMatchWithAnyNumberOfThem) {
   CompiledXml xml(CompiledXml::Pool::kUtf16);
   xml.Element("manifes" + kHigh + kHigh, {Package("p")});
   EXPECT_EQ(Read(xml), (Facts{"", false}));
@@ -336,7 +336,7 @@ TEST(AndroidManifestDocument, NoBytesAtAllFail) {
                                           "error=0x80000001\n")}));
 }
 
-TEST(AndroidManifestDocument, OneThatTurnsBadAfterTheManifestTagKeepsWhatWasFound) {
+TEST(AndroidManifestDocument, OneThatTurnsBadAfterTheManifestTagKeepsTheName) {
   EXPECT_EQ(Read(CompiledXml()
                      .Start("manifest", {Package("found")})
                      .BadNode()

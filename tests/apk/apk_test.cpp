@@ -59,7 +59,7 @@ TEST(ApkInit, WithoutDescriptorAndPathAllFlagsAreFalse) {
 }
 
 // A number below -1 does not name a descriptor either.
-TEST(ApkInit, ANegativeDescriptorWithoutAPathIsNone) {
+TEST(ApkInit, ANegativeDescriptorWithoutAPathIsRefused) {
   LogCapture log;
   Apk apk(-1);
   log.Clear();
@@ -165,7 +165,7 @@ TEST(ApkInit, DescriptorZeroFromItsOwnOpenCountsAsAFailure) {
   EXPECT_EQ(StateOf(apk), (State{false, false, false, false}));
 }
 
-TEST(ApkInit, DescriptorOneFromItsOwnOpenIsOneLikeOthers) {
+TEST(ApkInit, DescriptorOneFromItsOwnOpenIsUsed) {
   DiskFile file(MakePackage(WithoutDex()).Build());
   LogCapture log;
   Apk apk(-1);
@@ -283,7 +283,7 @@ TEST(ApkInit, ASecondInitThatFailsAfterLoadingItsManifestHasNoDigests) {
 
 // ---- The verification of a package, step by step.
 
-TEST(ApkInit, APackageWithoutManifestIsNotGoodAndSaysNothing) {
+TEST(ApkInit, APackageWithoutManifestIsNotGoodAndLogsNothing) {
   Package package = MakePackage(WithoutDex());
   package.Remove(kManifestName);
   LogCapture log;
@@ -293,7 +293,7 @@ TEST(ApkInit, APackageWithoutManifestIsNotGoodAndSaysNothing) {
 }
 
 // The manifest is read before the signature file and its block. Nothing is logged about these then.
-TEST(ApkInit, APackageWithoutManifestAndBlockSaysNothingOfEither) {
+TEST(ApkInit, APackageWithoutManifestAndBlockLogsNothing) {
   Package package = MakePackage(WithoutDex());
   package.Remove(kManifestName);
   package.Remove("META-INF/CERT.RSA");

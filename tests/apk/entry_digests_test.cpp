@@ -161,7 +161,7 @@ TEST(EntryDigests, NamesOfAttributesAreCaseSensitive) {
   EXPECT_EQ("none", recorded.Of("d"));
 }
 
-TEST(EntryDigests, NothingIsListedBeforeItIsAskedFor) {
+TEST(EntryDigests, NothingIsListedBeforeListIsCalled) {
   const std::string text = Section("a", "1");
   EntryDigests digests;
   EXPECT_TRUE(digests.Load({text.begin(), text.end()}));
@@ -172,7 +172,7 @@ TEST(EntryDigests, NothingIsListedBeforeItIsAskedFor) {
 }
 
 // Whether the new manifest parses or not, nothing is left of the one before.
-TEST(EntryDigests, LoadingAnotherManifestForgetsTheFirstOnes) {
+TEST(EntryDigests, LoadingAnotherManifestForgetsTheFirst) {
   LogCapture log;
   for (const std::string& other : {Section("b", "2"), std::string("Key:x")}) {
     const std::string text = Section("a", "1");
@@ -229,7 +229,7 @@ TEST(EntryDigests, NoMoreSectionsAreListedThanThereAre) {
   EXPECT_EQ("none", Found(digests, "c"));
 }
 
-TEST(EntryDigests, WhatIsFoundReplacesWhatTheTextsHeld) {
+TEST(EntryDigests, AFoundDigestReplacesBothTexts) {
   const std::string text = Section("a", "1");
   EntryDigests digests;
   ASSERT_TRUE(digests.Load({text.begin(), text.end()}));

@@ -293,7 +293,7 @@ TEST(VerifyFileHash, AFileThatCannotBeReadIsReported) {
 }
 
 // The digest is decoded first. The file is read even if the digest cannot be decoded.
-TEST(VerifyFileHash, AFileThatCannotBeReadIsReportedWhateverItsDigest) {
+TEST(VerifyFileHash, AFileThatCannotBeReadIsReportedWithAnyDigest) {
   for (const char* digest : {"not base64!", "====", "AAAA"}) {
     OpenPackage open(WithManifest(JarText::Manifest()
                                       .EndSection()

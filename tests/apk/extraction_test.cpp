@@ -26,7 +26,7 @@ extern "C" void* __wrap_mmap(void* address, size_t size, int protection, int fla
 
 namespace {
 
-TEST(Extraction, AnEntryReplacesWhatTheVectorHeld) {
+TEST(Extraction, AnEntryReplacesTheVectorsContents) {
   OpenEntry zip({"a", ToBytes("abc"), true});
   Bytes out(100, 1);
   EXPECT_EQ(ExtractZipEntry(zip.handle, &zip.entry, out), 0);
@@ -43,7 +43,7 @@ TEST(Extraction, AnEmptyEntryIsExtracted) {
 }
 
 // 258 bytes for every two bits: zeros come closest to deflate's limit.
-TEST(Extraction, WhatDeflatesBestIsPlausible) {
+TEST(Extraction, TheBestDeflatedDataIsPlausible) {
   const Bytes zeros(10 << 20, 0);
   OpenEntry zip({"a", zeros, true});
   EXPECT_GT(zeros.size(), 1020 * Deflate(zeros).size());

@@ -79,7 +79,7 @@ TEST_F(ManifestCalls, AttributeOfNoSizeIsReadWhenItIsAskedFor) {
   EXPECT_EQ(attribute_names, 1);
 }
 
-TEST_F(ManifestCalls, NoAttributesAreNone) {
+TEST_F(ManifestCalls, NoAttributesAreRead) {
   Read(CompiledXml()
            .StartWithSizelessAttributes("manifest", StringAttribute("package", "p"), 0)
            .End("manifest"));

@@ -177,7 +177,7 @@ TEST(ManifestMf, SeveralLinesContinueAValue) {
 }
 
 // The value is one piece of the manifest's own text, right after its name and ": ".
-TEST(ManifestMf, ContinuationLinesMoveUpBehindWhatTheyContinue) {
+TEST(ManifestMf, ContinuationLinesMoveUpToTheirValue) {
   ManifestMf manifest;
   EXPECT_TRUE(manifest.load(std::string("A: 1\r\n 23\n 45\r\n\r\n")));
   ASSERT_EQ(1u, manifest.getSections().size());

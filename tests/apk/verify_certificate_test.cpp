@@ -51,7 +51,7 @@ TEST(VerifyCertificate, ExponentsOfOneByteVerify) {
   }
 }
 
-TEST(VerifyCertificate, WhatIsNoSignatureBlockIsAnUnknownType) {
+TEST(VerifyCertificate, BytesThatAreNotASignatureBlockAreAnUnknownType) {
   Package package = MakePackage();
   package.Item("META-INF/CERT.RSA").data = ToBytes("no block");
   testing::internal::CaptureStdout();
@@ -76,7 +76,7 @@ TEST(VerifyCertificate, AnEllipticCurveKeyIsAnUnknownType) {
   testing::internal::GetCapturedStdout();
 }
 
-TEST(VerifyCertificate, ACertificateOfAnotherIssuerFailsThoughTheSignatureIsGood) {
+TEST(VerifyCertificate, ACertificateOfAnotherIssuerFailsEvenWithAGoodSignature) {
   SignatureBlock block;
   block.issuer_key = "rsa-2048-other";
   EXPECT_EQ(LogOf(WithBlock(block)),

@@ -96,7 +96,7 @@ TEST(MpiGrow, KeepsTheValueAndAddsZeros) {
   }
 }
 
-TEST(MpiAssign, CopiesTheValueAndClearsWhatWasThere) {
+TEST(MpiAssign, CopiesTheValueAndClearsTheOldLimbs) {
   Operands operands;
   for (int round = 0; round < kRounds; ++round) {
     Number X(operands.Magnitude(8), operands.Sign());
@@ -164,7 +164,7 @@ TEST(MpiCompare, ZeroLiesBetweenTheNegativeAndThePositiveNumbers) {
   }
 }
 
-TEST(MpiCompare, TwoZerosAreEqualWhateverTheirSigns) {
+TEST(MpiCompare, TwoZerosAreEqualWithAnySigns) {
   Number zero({0});
   Number negative({0, 0}, -1);
   EXPECT_EQ(0, mpi_compare(&zero, &negative));

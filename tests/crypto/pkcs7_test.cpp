@@ -187,7 +187,7 @@ TEST(ProcessCertKey, EcPointGivesTheSequenceLine) {
   EXPECT_EQ(processed.record.modulus, nullptr);
 }
 
-TEST(ProcessCertKey, EcPointWhoseSecondByteIsNoFittingLengthGivesTheUnreadableLine) {
+TEST(ProcessCertKey, EcPointWhoseSecondByteIsAWrongLengthGivesTheUnreadableLine) {
   const ProcessedBlock processed(WithPublicKey(Concat({{0x04, 0x7f}, Bytes(63, 0x11)})));
   EXPECT_EQ(processed.result, 1);
   EXPECT_EQ(processed.output, std::string(kUnreadable) + kKeyTrailer);
@@ -243,7 +243,7 @@ TEST(ProcessCertKey, ClassesAreNotLookedAt) {
   EXPECT_EQ(Field(processed.record.modulus, processed.record.modulus_length), modulus);
 }
 
-TEST(ProcessCertKey, ModulusThatIsNoIntegerGivesTheIntegerLine) {
+TEST(ProcessCertKey, ModulusThatIsNotAnIntegerGivesTheIntegerLine) {
   const ProcessedBlock processed(
       WithPublicKey(der::Sequence({der::OctetString(Bytes(64, 0x77)), der::Integer(3)})));
   EXPECT_EQ(processed.result, 1);
@@ -306,7 +306,7 @@ TEST(ProcessCertKey, ExponentMayStandBehindTheKey) {
   EXPECT_EQ(processed.record.exponent[0], 3);
 }
 
-TEST(ProcessCertKey, ExponentThatIsNoIntegerGivesTheIntegerLine) {
+TEST(ProcessCertKey, ExponentThatIsNotAnIntegerGivesTheIntegerLine) {
   const ProcessedBlock processed(
       WithPublicKey(der::Sequence({der::Integer(Bytes(64, 0x77)), der::OctetString({3})})));
   EXPECT_EQ(processed.result, 1);
@@ -350,7 +350,7 @@ TEST(ProcessCertKey, ExponentIsCopiedAsItIsWithZerosBehind) {
   }
 }
 
-TEST(ProcessCertKey, ExponentEndsInZerosWhateverTheRecordHeld) {
+TEST(ProcessCertKey, ExponentEndsInZerosAlsoInAUsedRecord) {
   const Bytes block = WithRsaKey(Bytes(64, 0x77), {3}).Build(kSignatureFile);
   pkcs7 record;
   memset(&record, 0x11, sizeof(record));

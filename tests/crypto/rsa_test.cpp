@@ -156,7 +156,7 @@ TEST(RsaPkcs1Verify, EveryByteOfTheDigestInfoPrefixCounts) {
   }
 }
 
-TEST(RsaPkcs1Verify, AnotherMdPrefixFailsSilentlyWhateverTheAlgorithm) {
+TEST(RsaPkcs1Verify, AnotherMdPrefixFailsSilentlyWithAnyAlgorithm) {
   const FixedKey key("rsa-1024");
   LogCapture log;
   for (size_t i = 0; i < 18; ++i) {
@@ -423,7 +423,7 @@ TEST(RsaSetKey, NullModulusGivesAnEmptyKeyThatVerifiesNothing) {
   EXPECT_EQ(5, Verify(context, Bytes(128)));
 }
 
-TEST(RsaSetKey, DiscardsWhatTheContextHeld) {
+TEST(RsaSetKey, DiscardsTheContextsOldKey) {
   const Bytes modulus(16, 0xFF);
   rsa_local context;
   context.N = {-1, 7, nullptr};

@@ -96,7 +96,7 @@ TEST(X509RunningOn, ElementsOfANameAreMinus12) {
 }
 
 // The bytes that the element takes exist, but belong to the element around its container.
-TEST(X509RunningOn, ElementsOfANameMayNotTakeWhatFollowsTheirContainer) {
+TEST(X509RunningOn, ElementsOfANameMayNotTakeBytesAfterTheirContainer) {
   const Bytes type = der::Oid(kCommonName);
   const Bytes attribute = der::Sequence({type, Value()});
   const Bytes rdn = der::Set({attribute});
@@ -249,7 +249,7 @@ TEST(X509Trailing, LoneByteAfterTheKeyIsMinus5) {
 }
 
 // Half of a header follows the last element that is read in each container.
-TEST(X509Trailing, WhatFollowsTheLastElementThatIsReadIsIgnored) {
+TEST(X509Trailing, BytesAfterTheLastElementThatIsReadAreIgnored) {
   const Bytes rest = {0x30};
   const Bytes time = der::Element(der::kUtcTime, "200102030405Z");
   const Bytes algorithm = der::Sequence({der::Oid("1.2.3"), der::Oid("1.2.4"), rest});

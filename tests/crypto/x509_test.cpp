@@ -86,14 +86,14 @@ TEST(X509CertificateParse, PublicKeyIsTheBitStringAfterTheCountOfUnusedBits) {
   OPENSSL_free(expected);
 }
 
-TEST(X509CertificateParse, WhatFollowsTheCertificateIsNotItsOwn) {
+TEST(X509CertificateParse, BytesAfterTheCertificateAreNotPartOfIt) {
   const Bytes der = Unsigned().Build();
   const ParsedCertificate parsed(Concat({der, Bytes(50, 0xff)}));
   EXPECT_EQ(parsed.result, 0);
   EXPECT_EQ(parsed.cert.cert_length, der.size());
 }
 
-TEST(X509CertificateParse, NothingGivenIsMinus2) {
+TEST(X509CertificateParse, MissingArgumentsAreMinus2) {
   const Bytes der = Unsigned().Build();
   x509_certificate cert;
   EXPECT_EQ(x509_certificate_parse(nullptr, der.size(), &cert), -2);
@@ -102,7 +102,7 @@ TEST(X509CertificateParse, NothingGivenIsMinus2) {
   EXPECT_EQ(x509_certificate_parse(der.data(), der.size(), &cert), 0);
 }
 
-TEST(X509CertificateParse, CertificateThatIsNoSequenceIsMinus3) {
+TEST(X509CertificateParse, CertificateThatIsNotASequenceIsMinus3) {
   EXPECT_EQ(ResultOf(der::Set({})), -3);
   EXPECT_EQ(ResultOf(Bytes{0x30}), -3);
   EXPECT_EQ(ResultOf(der::Context(16, {})), -3);
@@ -118,7 +118,7 @@ TEST(X509CertificateParse, CertificateThatRunsPastTheEndIsMinus3AndKeepsTheGiven
   EXPECT_EQ(parsed.cert.tbs_start, nullptr);
 }
 
-TEST(X509CertificateParse, TbsCertificateThatIsNoSequenceIsMinus3) {
+TEST(X509CertificateParse, TbsCertificateThatIsNotASequenceIsMinus3) {
   EXPECT_EQ(ResultOf(der::Sequence({})), -3);
   EXPECT_EQ(ResultOf(der::Sequence({der::Set({})})), -3);
   Certificate certificate = Unsigned();
@@ -370,7 +370,7 @@ TEST(X509OptionalFields, AnotherClassIsMinus5) {
   EXPECT_EQ(ResultOf(certificate), -5);
 }
 
-TEST(X509OptionalFields, WhatFollowsTheExtensionsIsIgnored) {
+TEST(X509OptionalFields, BytesAfterTheExtensionsAreIgnored) {
   Certificate certificate = Full();
   certificate.tbs_tail = {0xff};
   const ParsedCertificate parsed(certificate);

@@ -157,7 +157,7 @@ Installed PackageWithAnotherLibrary() {
   return Installed(MakePackage(options));
 }
 
-TEST(FaultsOfCalls, CostAGoodPackageWhatTheyAreFor) {
+TEST(FaultsOfCalls, OnAGoodPackageCostTheirOwnStep) {
   Installed file = GoodPackage();
   ExpectRuns(file, "LPK",
              {{"open", {"", "PK", "PK"}},     // the package; the library to read it, to sign it
@@ -169,7 +169,7 @@ TEST(FaultsOfCalls, CostAGoodPackageWhatTheyAreFor) {
               {"fgetxattr", {}}});            // only JARs have attributes
 }
 
-TEST(FaultsOfCalls, CostATrustedJarWhatTheyAreFor) {
+TEST(FaultsOfCalls, OnATrustedJarCostTheirOwnStep) {
   Installed file = TrustedJar();
   ExpectRuns(file, "J",
              {{"open", {""}},
@@ -181,7 +181,7 @@ TEST(FaultsOfCalls, CostATrustedJarWhatTheyAreFor) {
               {"fgetxattr", {"J"}}});
 }
 
-TEST(FaultsOfCalls, GetNothingSignedForAPackageThatIsNotGood) {
+TEST(FaultsOfCalls, OnABadPackageGetNothingSigned) {
   Installed file = PackageWithABadDex();
   ExpectRuns(file, "",
              {{"open", {""}},
@@ -193,7 +193,7 @@ TEST(FaultsOfCalls, GetNothingSignedForAPackageThatIsNotGood) {
               {"fgetxattr", {}}});
 }
 
-TEST(FaultsOfCalls, GetNoLibrarySignedThatIsNotTheManifests) {
+TEST(FaultsOfCalls, OnAnotherLibraryDoNotGetItSigned) {
   Installed file = PackageWithAnotherLibrary();
   ExpectRuns(file, "P",
              {{"open", {"", "P"}},
@@ -248,7 +248,7 @@ void ExpectRunsWithoutMemory(Installed& file, const std::string& all,
   FAIL() << "memory is asked for without end";
 }
 
-TEST(FaultsOfMemory, CostAGoodPackageWhatComesAfter) {
+TEST(FaultsOfMemory, OnAGoodPackageCostTheLaterSteps) {
   Installed file = GoodPackage();
   // Nothing verified; no stream for the integrity value, before either signing; no text for the
   // permission or for the package's name, which then reads as empty; a request whose failure does
@@ -256,17 +256,17 @@ TEST(FaultsOfMemory, CostAGoodPackageWhatComesAfter) {
   ExpectRunsWithoutMemory(file, "LPK", {"", "PK", "LK", "LP", "LPN", "LPK"});
 }
 
-TEST(FaultsOfMemory, CostATrustedJarWhatComesAfter) {
+TEST(FaultsOfMemory, OnATrustedJarCostTheLaterSteps) {
   Installed file = TrustedJar();
   ExpectRunsWithoutMemory(file, "J", {"", "J"});
 }
 
-TEST(FaultsOfMemory, GetNothingSignedForAPackageThatIsNotGood) {
+TEST(FaultsOfMemory, OnABadPackageGetNothingSigned) {
   Installed file = PackageWithABadDex();
   ExpectRunsWithoutMemory(file, "", {""});
 }
 
-TEST(FaultsOfMemory, GetNoLibrarySignedThatIsNotTheManifests) {
+TEST(FaultsOfMemory, OnAnotherLibraryDoNotGetItSigned) {
   Installed file = PackageWithAnotherLibrary();
   ExpectRunsWithoutMemory(file, "P", {"", "P"});
 }

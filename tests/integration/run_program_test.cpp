@@ -54,7 +54,7 @@ TEST(RunProgram, TellsTheSignal) {
   Expect(Shell("kill -KILL $$"), RunEnd::kKilled, SIGKILL);
 }
 
-TEST(RunProgram, KillsWhatTakesTooLong) {
+TEST(RunProgram, KillsAProgramThatTakesTooLong) {
   RunLimits limits;
   limits.milliseconds = 200;
   const auto start = std::chrono::steady_clock::now();
@@ -65,13 +65,13 @@ TEST(RunProgram, KillsWhatTakesTooLong) {
   EXPECT_EQ(waitpid(-1, nullptr, WNOHANG), -1);  // it is gone
 }
 
-TEST(RunProgram, LeavesWhatEndsInTimeAlone) {
+TEST(RunProgram, LeavesAProgramThatEndsInTimeAlone) {
   RunLimits limits;
   limits.milliseconds = 20000;
   Expect(RunProgram({"/bin/sleep", "0.3"}, limits), RunEnd::kExited, 0);
 }
 
-TEST(RunProgram, ThatIsNotThereIsNotStarted) {
+TEST(RunProgram, ThatIsMissingIsNotStarted) {
   Expect(RunProgram({"/nowhere/apktoolkit"}, {}), RunEnd::kNotStarted, 0);
   Expect(RunProgram({"/dev/null"}, {}), RunEnd::kNotStarted, 0);
 }
@@ -94,7 +94,7 @@ TEST(RunProgram, HasNullForItsStreamsAndNothingElseOpen) {
 }
 
 // A daemon may not have standard streams.
-TEST(RunProgram, HasItsStreamsThoughThisProcessHasNone) {
+TEST(RunProgram, HasItsStreamsEvenIfThisProcessHasNone) {
   std::string streams;
   {
     const FreeDescriptor input(STDIN_FILENO), output(STDOUT_FILENO), errors(STDERR_FILENO);
@@ -140,7 +140,7 @@ TEST(RunProgram, WithoutDescriptorsIsNotStarted) {
 }
 
 // While SIGCHLD is ignored, the kernel drops the status.
-TEST(RunProgram, WhoseStatusSomebodyElseTookIsLost) {
+TEST(RunProgram, WhoseStatusAnotherCallTookIsLost) {
   const auto before = signal(SIGCHLD, SIG_IGN);
   Expect(RunProgram({"/bin/true"}, {}), RunEnd::kLost, ECHILD);
   signal(SIGCHLD, before);

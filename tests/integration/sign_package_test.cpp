@@ -76,13 +76,13 @@ TEST_F(Phone, LeavesAPackageWithoutAJarSignatureAlone) {
 }
 
 // The signature file's signature is good, but the dex does not match.
-TEST_F(Phone, DoesNotTrustWhatTheToolRefuses) {
+TEST_F(Phone, DoesNotTrustAPackageThatTheToolRefuses) {
   const InstalledPackage package = Install("changed-dex");
   EXPECT_EQ(Sign(package), SignOutcome::kNotTrusted);
   EXPECT_FALSE(IsTrusted(package.path));
 }
 
-TEST_F(Phone, DoesNotTrustWhatTheKernelRefuses) {
+TEST_F(Phone, DoesNotTrustAPackageThatTheKernelRefuses) {
   InstallProgram("apktoolkit", Simulator("--sign-errno EPERM"));
   EXPECT_EQ(Sign(Install("apksigner-sha256-2048")), SignOutcome::kNotTrusted);
 }

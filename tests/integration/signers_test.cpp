@@ -124,7 +124,7 @@ TEST(Signers, OneOfSeveralIsEnough) {
 }
 
 // From API level 28 on the package manager uses the new key. The JAR signature is the old key's.
-TEST(Signers, RetiredKeyIsNoSigner) {
+TEST(Signers, RetiredKeyIsNotASigner) {
   const std::string apk = Golden("rotated-key/base.apk");
   EXPECT_EQ(SignersOf(apk, 33), DigestOfKey("openssl-cms-issued"));
   ExpectNotRun(kOtherSigner, SignersOf(apk, 33), apk);
@@ -148,7 +148,7 @@ TEST(Signers, ThatAreNotRsaHaveNoDigest) {
   ExpectNotRun(kNoJarSigner, "", apk);
 }
 
-TEST(Signers, OfFilesWithoutAJarSignatureThatHoldsAreNone) {
+TEST(Signers, OfFilesWithoutAGoodJarSignatureAreEmpty) {
   const TempDir directory;
   const std::string text = directory.Write("text", ToBytes("no archive"));
   PackageOptions jar;
@@ -165,7 +165,7 @@ TEST(Signers, OfFilesWithoutAJarSignatureThatHoldsAreNone) {
 }
 
 // Only a whole digest matches, and an empty list of signers never does.
-TEST(Signers, AreComparedWhole) {
+TEST(Signers, AreComparedAsWholeDigests) {
   const std::string apk = Golden("apksigner-sha256-2048/base.apk");
   const std::string key = DigestOfKey("apksigner-sha256-2048");
   for (const std::string& digests :

@@ -35,7 +35,7 @@ TEST(Main, WithoutStandardInputTheFileIsLeftAlone) {
   EXPECT_EQ(run.output + run.errors, "");
 }
 
-TEST(Main, AFifoIsNoArchiveAndNothingToWaitFor) {
+TEST(Main, AFifoIsRefusedWithoutWaiting) {
   const TempDir directory;
   ASSERT_EQ(mkfifo((directory / "fifo").c_str(), 0600), 0);
   const ProcessResult run = RunTool("timeout 20 \"$0\" \"$1\" </dev/null", directory / "fifo");

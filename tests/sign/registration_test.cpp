@@ -183,7 +183,7 @@ TEST(ZuSign, TheRefusalOfAJarIsReported) {
                                          Error("ZuAddCertificate: ZuNewCertificate failed 5.\n")}));
 }
 
-TEST(ZuSign, AFileThatIsNoZipArchiveStopsSilentlyAtThePermission) {
+TEST(ZuSign, AFileThatIsNotAZipArchiveStopsSilentlyAtThePermission) {
   LogCapture log;
   Phone phone;
   phone.zu_attribute_size = 1;

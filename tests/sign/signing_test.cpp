@@ -71,7 +71,7 @@ TEST(VeltSign, APackageThatDidNotVerifyIsNotSignedAndGetsNoMessageOfItsOwn) {
                                          Info("VeltSign finished: 65536.\n")}));
 }
 
-TEST(VeltSign, AFileThatIsNoZipArchiveIsRefused) {
+TEST(VeltSign, AFileThatIsNotAZipArchiveIsRefused) {
   LogCapture log;
   Phone phone;
   MemoryFile file(ToBytes("no archive"));
@@ -181,7 +181,7 @@ TEST(VeltSignJni, ALibraryIsOpenedWithoutWaiting) {
 }
 
 // A file among the libraries that is not a library is left alone, even if the manifest lists it.
-TEST(VeltSignJni, AnEntryOfAnotherEndingIsNoLibrary) {
+TEST(VeltSignJni, AnEntryWithAnotherEndingIsNotALibrary) {
   const std::vector<ZipItem> others = {Library("lib/arm64-v8a/libfoo.so.txt"),
                                        Library("lib/arm64-v8a/libfoo.SO"),
                                        Library("lib/arm64-v8a/so")};
@@ -211,7 +211,7 @@ TEST(VeltSignJni, AnEntryOfNoRowIsPassedOverWithoutAMessage) {
 }
 
 // The zip library orders the two by their names.
-TEST(VeltSignJni, ALibraryOfAnotherAbiEndsNothingWhicheverIsWalkedFirst) {
+TEST(VeltSignJni, ALibraryOfAnotherAbiDoesNotEndTheWalkInEitherOrder) {
   const ZipItem library = Library("lib/arm64-v8a/libfoo.so");
   int first = 0, last = 0;  // how often the other library was
   for (int i = 0; i < 100 && (first == 0 || last == 0); ++i) {

@@ -103,7 +103,7 @@ TEST_F(ZipCallsTest, ADescriptorWithAPathStaysTheCallers) {
   EXPECT_EQ(calls.ownership, std::vector<bool>({false}));
 }
 
-TEST_F(ZipCallsTest, AfterAnOpeningThatFailedThereIsNoArchive) {
+TEST_F(ZipCallsTest, AFailedOpeningLeavesNoArchive) {
   OpenPackage open(ToBytes("This is not a zip archive, but a text."));
   void* cookie = nullptr;
   EXPECT_NE(open.apk.StartIteration(&cookie, "", ""), 0);
@@ -128,7 +128,7 @@ TEST_F(ZipCallsTest, WithoutAWalkNoLibraryIsSignedAndTheResultIsTheSame) {
   EXPECT_EQ(calls.filters.back(), "lib/ .so");
 }
 
-TEST_F(ZipCallsTest, WithoutAWalkThereIsNoSignatureFile) {
+TEST_F(ZipCallsTest, WithoutAWalkNoSignatureFileIsFound) {
   const Package package = MakePackage();
   calls.no_iteration = true;
   OpenPackage open(package);
@@ -137,7 +137,7 @@ TEST_F(ZipCallsTest, WithoutAWalkThereIsNoSignatureFile) {
   EXPECT_EQ(log_.records(), Records());
 }
 
-TEST_F(ZipCallsTest, AWalkThatFindsNothingIsEndedAllTheSame) {
+TEST_F(ZipCallsTest, AWalkThatFindsNothingIsEndedToo) {
   Package package = MakePackage();
   package.Remove("META-INF/CERT.SF");
   OpenPackage open(package);

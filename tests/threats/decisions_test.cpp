@@ -28,7 +28,7 @@ Bytes WithForgedBlock(const Bytes& exponent) {
 
 // All ways to write 1 and -1 so that the record reads them, with any tail that keeps the length of
 // the modulus at 256: 00 01 00 00 in host byte order.
-TEST(Threat, AnExponentOfOneIsRefusedHoweverItIsWritten) {
+TEST(Threat, AnExponentOfOneIsRefusedInEveryForm) {
   for (const char* exponent :
        {"01", "01 00", "01 00 00", "01 00 00 00", "FF FF FF FF", "01 00 00 00 00 01",
         "01 00 00 00 00 01 00", "01 00 00 00 00 01 00 00", "01 00 00 00 00 01 00 00 AA BB",
@@ -92,7 +92,7 @@ class ExchangedLibrary : public testing::Test {
   int seen_ = 0;
 };
 
-TEST_F(ExchangedLibrary, ThatStaysAsItWasIsSigned) {
+TEST_F(ExchangedLibrary, ThatStaysUnchangedIsSigned) {
   EXPECT_EQ(FilesSigned([] {}), Strings({"mine/libx.so", "app/base.apk"}));
 }
 

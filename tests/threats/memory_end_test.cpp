@@ -20,7 +20,7 @@ bool ParseAtMemoryEnd(ApkTools::Apk* apk, const Bytes& document) {
   return parsed;
 }
 
-TEST(CompiledManifestAtMemoryEnd, IsNotReadBeyondHoweverShortItIs) {
+TEST(CompiledManifestAtMemoryEnd, IsNotReadBeyondAtAnyLength) {
   const Bytes whole = CompiledManifest("com.example.app", true);
   for (size_t size = 0; size <= whole.size(); ++size) {
     LogCapture log;
@@ -68,7 +68,7 @@ TEST(CompiledManifestAtMemoryEnd, IsNotReadBeyondForAnAttributeThatIsNotThere) {
   EXPECT_EQ(apk.GetPackageName(), "p");
 }
 
-TEST(CompiledManifestAtMemoryEnd, WithoutRoomForAHeaderIsNone) {
+TEST(CompiledManifestAtMemoryEnd, WithoutRoomForAHeaderIsRefused) {
   const Bytes whole = CompiledManifest("com.example.app");
   for (int size = 0; size < 8; ++size) {
     ApkTools::Apk apk(-1);
@@ -121,7 +121,7 @@ TEST(ManifestSectionsAtMemoryEnd, AreNotReadBeyondTheLastAttribute) {
 
 // Names and values of all lengths below eight bytes, which are read at once; the text is whole, or
 // cut anywhere. A block ends where memory ends if its size is a multiple of 4.
-TEST(JarManifestAtMemoryEnd, IsNotReadBeyondWhereverItEnds) {
+TEST(JarManifestAtMemoryEnd, IsNotReadBeyondAtAnyLength) {
   for (size_t length = 1; length < 20; ++length) {
     const std::string run(length, 'v');
     const std::string whole = run + ": " + run + "\r\n " + run + "\r\nKey:\r\n " + run + "\r\n\r\n";

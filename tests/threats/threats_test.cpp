@@ -143,7 +143,7 @@ TEST(Threat, FileIsReadAndSignedForEachEntryThatNamesIt) {
             Strings({"app/lib/arm64/a.so", "app/lib/arm64/a.so", "app/base.apk"}));
 }
 
-TEST(Threat, ReplacedAndroidManifestNamesWhatTheSignersKeyIsRegisteredFor) {
+TEST(Threat, ReplacedAndroidManifestNamesThePackageOfTheSignersKey) {
   Package package = MakePackage();
   package.Item(kAndroidManifestName).data = CompiledManifest("com.example.other", true);
   EXPECT_EQ(Device(package).Registered(),
@@ -170,7 +170,7 @@ TEST(Threat, PackageWhoseAndroidManifestCannotBeExtractedIsAJarThatTheKernelMust
 
 // ---- Refused, damaged and unextracted libraries, and the steps that they do not stop.
 
-TEST(Threat, PackageAndKeyAreTakenThoughEveryLibraryIsRefused) {
+TEST(Threat, PackageAndKeyAreAcceptedEvenIfEveryLibraryIsRefused) {
   PackageOptions options;
   options.secure_storage = true;
   Device device(MakePackage(options));

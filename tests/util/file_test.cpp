@@ -206,7 +206,7 @@ TEST_F(ReadFileTest, FileThatTheAddressSpaceHasNoRoomForHasNoSize) {
   EXPECT_EQ(3U, tried);
 }
 
-TEST_F(ReadFileTest, FileWhoseKindIsNotToldHasNoSize) {
+TEST_F(ReadFileTest, FileOfUnknownKindHasNoSize) {
   kernel.fstat = [](struct stat*) { return -1; };
   ExpectNoSize(MakeFile("abc"));
 }
@@ -222,7 +222,7 @@ TEST_F(ReadFileTest, FileThatCannotBeRewoundHasNoSize) {
 }
 
 // Like a file that grows or shrinks between the two calls.
-TEST_F(ReadFileTest, SizeIsWhereTheFileEndsAndNotWhatItsStateSays) {
+TEST_F(ReadFileTest, SizeIsTheFilesEndAndNotTheStatesSize) {
   for (const off_t end : {off_t{2}, off_t{5}}) {
     kernel.lseek = [end](int whence) { return whence == SEEK_END ? end : off_t{0}; };
     Bytes out;
@@ -244,7 +244,7 @@ TEST_F(ReadFileTest, FileThatShrinksMeanwhileIsTrueAndEndsInZeros) {
   EXPECT_EQ(Records(), log.records());
 }
 
-TEST_F(ReadFileTest, FileThatShrinksMeanwhileLeavesWhatTheVectorHeld) {
+TEST_F(ReadFileTest, FileThatShrinksMeanwhileLeavesTheVectorsOldBytes) {
   const std::string path = MakeFile("abcdef");
   kernel.read = [&](int fd, void* buffer, size_t size) {
     EXPECT_EQ(0, truncate(path.c_str(), 2));
@@ -315,7 +315,7 @@ TEST_F(GetFilenameByFdTest, RemovedFileIsMarkedAsTheKernelMarksIt) {
   close(fd);
 }
 
-TEST_F(GetFilenameByFdTest, ClosedDescriptorHasNone) {
+TEST_F(GetFilenameByFdTest, ClosedDescriptorHasNoPath) {
   LogCapture log;
   const int fd = open("/dev/null", O_RDONLY | O_CLOEXEC);
   close(fd);
@@ -360,7 +360,7 @@ class DeepDirectory {
 
 // ---- Through a descriptor.
 
-TEST_F(ReadFileTest, DescriptorIsReadFromItsStartWhateverThePathLeadsTo) {
+TEST_F(ReadFileTest, DescriptorIsReadFromItsStartIfThePathLeadsElsewhere) {
   const int fd = open(MakeFile("abc").c_str(), O_RDONLY | O_CLOEXEC);
   EXPECT_EQ(2, lseek(fd, 2, SEEK_SET));
   ASSERT_EQ(0, unlink(Path("file").c_str()));
@@ -445,7 +445,7 @@ TEST_F(ReadFileTest, LeasedFileIsReadOnceItsHolderGivesItUp) {
   EXPECT_EQ(before, NextDescriptor());
 }
 
-TEST_F(OpenForReadingTest, TellsWhyAFileIsNotOpened) {
+TEST_F(OpenForReadingTest, SetsErrnoIfTheFileIsNotOpened) {
   EXPECT_EQ(-1, OpenForReading(Path("missing").c_str(), 0));
   EXPECT_EQ(ENOENT, errno);
 }
@@ -501,7 +501,7 @@ TEST(IsSameFile, EachPartOfTheStateCounts) {
 }
 
 // Both states are equal, but not those of a regular file.
-TEST(IsSameFile, WhatIsNoRegularFileIsNone) {
+TEST(IsSameFile, FilesThatAreNotRegularAreNotTheSame) {
   struct stat state = {};
   EXPECT_FALSE(IsSameFile(state, state));
   state.st_mode = S_IFDIR | 0700;
@@ -528,7 +528,7 @@ TEST_F(GetFilenameByFdTest, TargetPathOf4096BytesIsNotToldByTheKernel) {
   EXPECT_EQ("", GetFilenameByFd(deep.fd()));
 }
 
-TEST_F(GetFilenameByFdTest, OfALongerTargetPathThatIsToldTheFirst4095BytesAreTaken) {
+TEST_F(GetFilenameByFdTest, ALongerTargetPathIsItsFirst4095Bytes) {
   std::string target(5000, 'a');
   target[4094] = 'y';
   target[4095] = 'z';

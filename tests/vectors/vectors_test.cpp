@@ -173,7 +173,7 @@ TEST(Vectors, OfThisProjectAreJudgedAsTheySay) {
   EXPECT_EQ(JudgeFile(VECTORS_DIR "/rsa_signature_apktoolkit_test.json"), Of(16, 0, 9, 127, 0));
 }
 
-TEST(Vectors, OfThisProjectAreWhatTheirRecipeMakes) {
+TEST(Vectors, OfThisProjectAreMadeByTheirRecipe) {
   EXPECT_TRUE(RunProcess({VECTORS_DIR "/make_vectors"}).output ==
               ContentOf(VECTORS_DIR "/rsa_signature_apktoolkit_test.json"));
 }
