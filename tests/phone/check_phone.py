@@ -140,8 +140,8 @@ def check_trial(programs, golden):
            "base.apk: not trusted (errno 126, ENOKEY)\n")
     expect("a kernel that refuses", trial(programs, good, "--sign-errno EPERM"), 1,
            "E/ApkToolkit: VELT can't sign a file (result=10000, errno 1", "base.apk: not trusted")
-    expect("no phone", trial(programs, good, "no phone"), 2, "try-on-phone: there is no phone\n")
-    expect("no root", trial(programs, good, "no root"), 2, "it takes a userdebug build\n")
+    expect("no phone", trial(programs, good, "no phone"), 2, "try-on-phone: adb finds no phone: connect one, or start adb\n")
+    expect("no root", trial(programs, good, "no root"), 2, "install a userdebug build on the phone\n")
     expect("no package", trial(programs, golden), 2, "usage: try-on-phone")
     with tempfile.TemporaryDirectory() as name:
         changed = pathlib.Path(name) / "package"

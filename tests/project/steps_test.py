@@ -123,7 +123,7 @@ def emulator_problems():
         shutil.copy(ROOT / "scripts/kernel", directory / "scripts")
         write(directory / "scripts/setup", "[[ $1 != emulator ]]")
         run = subprocess.run([directory / "scripts/kernel"], capture_output=True, text=True)
-        expected = (77, "skipped: there is no qemu, and it cannot be installed\n")
+        expected = (77, "skipped: qemu is missing, and apt-get cannot install it\n")
         found = (run.returncode, run.stdout)
         return [] if found == expected else [f"scripts/kernel without qemu ends with {found}"]
 
@@ -135,11 +135,11 @@ def skip_problems():
         (directory / "scripts").mkdir()
         shutil.copy(ROOT / "scripts/bare-system", directory / "scripts")
         write(directory / "wget", "exit 4")
-        reasons = [("exit 1", "debootstrap is not there, and cannot be installed"),
-                   ("true", "there is no http://mirror.invalid/debian/dists/trixie/Release to be had")]
+        reasons = [("exit 1", "debootstrap is missing, and apt-get cannot install it"),
+                   ("true", "http://mirror.invalid/debian/dists/trixie/Release cannot be fetched")]
         for setup, reason in reasons:
             write(directory / "scripts/setup", setup)
-            expected = reason if os.geteuid() == 0 else "a bare system can be made by root alone"
+            expected = reason if os.geteuid() == 0 else "only root can make a bare system"
             run = subprocess.run([directory / "scripts/bare-system", "13"], capture_output=True, text=True,
                                  env={**os.environ, "PATH": f"{directory}:{os.environ['PATH']}",
                                       "DEBIAN_MIRROR": "http://mirror.invalid/debian"}, check=False)
