@@ -1,5 +1,5 @@
-// Says of a package whether its JAR signature is good, and whose it is: what a program looks like
-// that links the verification. Nothing is signed here. Phones may install the package for another
+// Tells whether a package's JAR signature is good, and who signed it. It shows what a program looks
+// like that links the verification. It signs nothing. Phones may install the package for another
 // signer than this one: README.md tells how to compare the two.
 #include <fcntl.h>
 #include <unistd.h>
@@ -37,7 +37,8 @@ bool IsGood(const char* name, int fd) {
 
 }  // namespace
 
-// Ends with 0 for a good package, 1 for another file, 2 where there is nothing to look at.
+// Exit status: 0 a good package; 1 another file; 2 a wrong command line, or the file cannot be
+// opened.
 int main(int argc, char* argv[]) {
   if (argc != 2) {
     fprintf(stderr, "usage: verify FILE\n");

@@ -1,6 +1,7 @@
 #!/usr/bin/env python3
-"""Holds the platform's build against CMake's: the file lists of both, which are also held against the
-folders, what the linker wraps for a test, and what a blueprint may say in a tree of Android 8.1."""
+"""Compares the platform's build with CMake's: the file lists of both, also with the directories;
+the calls that the linker wraps for a test; and the words that a blueprint may use in Android
+8.1."""
 
 import json
 import pathlib
@@ -10,7 +11,7 @@ import sys
 from blueprint import Blueprint
 from sources import ROOMS, ROOT, report, tool_sources
 
-# What needs more than a phone has, and so is in the workstation's build alone.
+# Sources that need more than a phone has. Only the workstation's build has them.
 WORKSTATION_ONLY = {
     "tests/apk/manifest_mf_test.cpp": "runs the JDK",
     "tests/crypto/mpi_mod_mpi_test.cpp": "compares with GMP",
@@ -30,15 +31,15 @@ WORKSTATION_ONLY = {
     "fuzz/verdict_fuzz.cpp": "judges with the simulator",
 }
 
-# The words that the build of Android 8.1 knows. An unknown one stops the whole tree.
+# The words that the build of Android 8.1 knows. An unknown word stops the whole tree.
 KNOWN_TYPES = {"cc_binary", "cc_defaults", "cc_library_shared", "cc_library_static", "cc_test",
                "filegroup"}
 KNOWN_PROPERTIES = {"cflags", "compile_multilib", "cpp_std", "data", "defaults",
                     "export_include_dirs", "init_rc", "ldflags", "local_include_dirs", "name", "shared_libs",
                     "srcs", "static_libs"}
 
-# The first is for headers that are the system's here and the user's there. For the second, the
-# developers' presets use a variable of CMake's own.
+# The first flag is for headers that are system headers in CMake's build but not in the platform's.
+# The developers' presets set the second by a variable of CMake's own.
 PLATFORM_ONLY_FLAGS = {"-Wno-sign-conversion", "-Werror"}
 
 
@@ -71,7 +72,7 @@ def hold_tool(platform, problems):
     compare("libzu", platform.sources("libzu"), cmake_sources("zu"), problems)
     listed = core + cmake_sources("apktoolkit") + cmake_sources("apktoolkit-verify")
     listed += cmake_sources("zu")
-    compare("the tool's folders", listed, map(str, tool_sources()), problems)
+    compare("the tool's directories", listed, map(str, tool_sources()), problems)
 
 
 def hold_tests(tests, fuzz, problems):
@@ -121,22 +122,22 @@ def hold_wraps(tests, problems):
 def hold_words(platform, tests, problems):
     for module in platform.modules + tests.modules:
         words = {module["type"]} - KNOWN_TYPES
-        words |= set(module) - {"type", "folder"} - KNOWN_PROPERTIES
+        words |= set(module) - {"type", "directory"} - KNOWN_PROPERTIES
         problems += [f"{module['name']}: Android 8.1 does not know {word}" for word in sorted(words)]
         if module.get("cpp_std", "c++1z") != "c++1z":
             problems.append(f"{module['name']}: Android 8.1 does not know {module['cpp_std']}")
-    # It reads no other blueprints than those named, later releases read all that there are.
+    # Android 8.1 reads only the named blueprints. Later releases read all that they find.
     compare("blueprints below the first", platform.variables["subdirs"],
             [path.parent.name for path in ROOT.glob("*/Android.bp")], problems)
 
 
-def cmake_sources(target, folder="."):
-    path = ROOT / folder / "CMakeLists.txt"
+def cmake_sources(target, directory="."):
+    path = ROOT / directory / "CMakeLists.txt"
     found = re.search(r"(?:add_library|add_executable|apktoolkit_add_test)\(%s\s+([^)]*)\)" % target,
                       without_comments_of_cmake(path))
     if not found:
         sys.exit(f"{path} has no target {target}")
-    return sorted(str(pathlib.Path(folder, word)) for word in found[1].split()
+    return sorted(str(pathlib.Path(directory, word)) for word in found[1].split()
                   if word.endswith(".cpp"))
 
 

@@ -1,9 +1,9 @@
 #!/usr/bin/env python3
-"""Runs what docs/guide.md shows, and holds the page against what is printed.
+"""Runs the commands of docs/guide.md, and compares the page with their output.
 
-Arguments: the folder of the golden packages, and the words that start apktoolkit-sim. With --write
-before them, the page is brought up to date instead. A last line of three dots stands for what
-follows, and a command that is followed by them alone prints what it likes.
+Arguments: the directory of the golden packages, and the words that start apktoolkit-sim. With
+--write before them, the page is updated instead. A last line of three dots stands for the rest of
+the output. A command followed by three dots alone may print anything.
 """
 
 import os
@@ -18,56 +18,56 @@ import zipfile
 from sources import ROOT, path_with_simulator, report
 
 PAGE = ROOT / "docs/guide.md"
-FOLDER = "/data/app/vault"  # what the page has in place of this test's folder
+DIRECTORY = "/data/app/vault"  # replaces the path of this test's directory on the page
 BLOCK = re.compile(r"^```\n(\$ .*?)\n```$", re.M | re.S)
 
-# What is another with each certificate that is made, and with each compiler of the library: on the
-# page, any will do.
+# Texts that differ with each new certificate, and with each compiler of the library. Any value is
+# right on the page.
 VARIES = [(re.compile(r"certificate SHA-256 digest: [0-9a-f]{64}"), "certificate SHA-256 digest: *"),
           (re.compile(r"\(\d+ bytes\) verified"), "(* bytes) verified"),
           (re.compile(r"(signer CN=Example, RSA-2048, key ).*"), r"\1*")]
 
 
-def prepare(golden, folder):
-    """The files that the page speaks of."""
+def prepare(golden, directory):
+    """Makes the files that the page names."""
     package = golden / "apksigner-sha256-2048"
-    shutil.copy(package / "base.apk", folder)
-    shutil.copytree(package, folder / "tampered")
-    library = folder / "tampered/lib/arm64/libvault.so"
+    shutil.copy(package / "base.apk", directory)
+    shutil.copytree(package, directory / "tampered")
+    library = directory / "tampered/lib/arm64/libvault.so"
     library.write_bytes(library.read_bytes()[:-1])
     for name, source in (("newer-only", "apksigner-newer-only"), ("changed-dex", "changed-dex"),
                          ("added-entry", "added-entry"), ("sha1", "apksigner-sha1-2048")):
-        shutil.copytree(golden / source, folder / name)
-    (folder / "alone").mkdir()
-    shutil.copy(package / "base.apk", folder / "alone")
-    shutil.copy(golden / "unsigned.apk", folder)
-    shutil.copy(golden / "rsa-2048.pem", folder / "signer.pem")
-    (folder / "notes.txt").write_text("nothing")
-    with zipfile.ZipFile(folder / "library.jar", "w") as archive:
+        shutil.copytree(golden / source, directory / name)
+    (directory / "alone").mkdir()
+    shutil.copy(package / "base.apk", directory / "alone")
+    shutil.copy(golden / "unsigned.apk", directory)
+    shutil.copy(golden / "rsa-2048.pem", directory / "signer.pem")
+    (directory / "notes.txt").write_text("nothing")
+    with zipfile.ZipFile(directory / "library.jar", "w") as archive:
         archive.writestr("a.txt", "a")
 
 
 def commands(block):
-    """The commands of one block, each with the lines that it prints on the page."""
+    """The commands of one block, each with its output on the page."""
     for part in re.split(r"^\$ ", block, flags=re.M)[1:]:
         command, *expected = part.splitlines()
         yield command, expected
 
 
 class Shell:
-    """A shell in the folder, so that a command finds what the one before it left."""
+    """A shell in the directory. A command finds the files and variables that earlier commands left."""
 
-    def __init__(self, folder, simulator):
-        self.folder = folder
-        self.path = path_with_simulator(folder, simulator)
+    def __init__(self, directory, simulator):
+        self.directory = directory
+        self.path = path_with_simulator(directory, simulator)
         self.status = 0
 
     def run(self, command):
-        run = subprocess.run(["bash", "-c", f"(exit {self.status})\n{command}"], cwd=self.folder,
+        run = subprocess.run(["bash", "-c", f"(exit {self.status})\n{command}"], cwd=self.directory,
                              env={**os.environ, "PATH": self.path, "LC_ALL": "C.UTF-8"},
                              stdout=subprocess.PIPE, stderr=subprocess.STDOUT, text=True)
         self.status = run.returncode
-        return run.stdout.replace(str(self.folder), FOLDER).splitlines()
+        return run.stdout.replace(str(self.directory), DIRECTORY).splitlines()
 
 
 def settled(lines):
@@ -99,9 +99,9 @@ def main():
     page = PAGE.read_text()
     problems = [] if BLOCK.search(page) else ["docs/guide.md shows no command"]
     with tempfile.TemporaryDirectory() as name:
-        folder = pathlib.Path(name).resolve()
-        prepare(pathlib.Path(golden), folder)
-        shell = Shell(folder, simulator)
+        directory = pathlib.Path(name).resolve()
+        prepare(pathlib.Path(golden), directory)
+        shell = Shell(directory, simulator)
         for block in BLOCK.findall(page):
             found, right = check(block, shell)
             problems += found

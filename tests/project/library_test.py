@@ -1,8 +1,8 @@
 #!/usr/bin/env python3
-"""Installs the library into a folder of its own, builds and runs the example against it as
+"""Installs the library into its own directory, builds and runs the example with it as
 examples/README.md shows, and compiles each installed header alone.
 
-Arguments: the build tree, the compiler, and the folder of a good package.
+Arguments: the build tree, the compiler, and the directory of a good package.
 """
 
 import concurrent.futures
@@ -21,35 +21,36 @@ MARK = "== next command"
 
 
 def change_manifest(package, out):
-    """A copy of the package with one attribute more in its signed manifest."""
+    """Copies the package, with one more attribute in its signed manifest."""
     with zipfile.ZipFile(package) as source, zipfile.ZipFile(out, "w") as copy:
         for name in source.namelist():
             more = b"X: y\r\n" if name == "META-INF/MANIFEST.MF" else b""
             copy.writestr(name, source.read(name) + more)
 
 
-def prepare(folder, build, package):
-    """The page's folder: what a checkout has, the build tree, and the files that the page names."""
-    shutil.copytree(ROOT / "examples", folder / "examples")
-    (folder / "build").mkdir()
-    (folder / "build/release").symlink_to(build)
-    shutil.copy(package / "base.apk", folder)
-    change_manifest(package / "base.apk", folder / "changed.apk")
+def prepare(directory, build, package):
+    """Fills the page's directory: files of a checkout, the build tree, and the files that the page
+    names."""
+    shutil.copytree(ROOT / "examples", directory / "examples")
+    (directory / "build").mkdir()
+    (directory / "build/release").symlink_to(build)
+    shutil.copy(package / "base.apk", directory)
+    change_manifest(package / "base.apk", directory / "changed.apk")
 
 
 def shown_commands(page):
-    """The page's commands, each with the lines that it is said to print; None is for any."""
+    """The page's commands, each with its output on the page; None stands for any output."""
     for block in re.findall(r"^```\n(\$ .*?)\n```$", page, re.M | re.S):
         for command in re.split(r"^\$ ", block, flags=re.M)[1:]:
             command, *lines = command.splitlines()
             yield command, None if lines == ["..."] else lines
 
 
-def run(commands, folder, compiler):
-    """What each command prints, all of them being lines of one shell, up to the first that fails."""
+def run(commands, directory, compiler):
+    """The output of each command. All run in one shell, until one fails."""
     script = "set -euo pipefail\n" + "\n".join(f"echo '{MARK}'; {command}" for command in commands)
-    environment = {**os.environ, "HOME": str(folder), "CXX": compiler}
-    result = subprocess.run(["bash", "-c", script], cwd=folder, env=environment, text=True,
+    environment = {**os.environ, "HOME": str(directory), "CXX": compiler}
+    result = subprocess.run(["bash", "-c", script], cwd=directory, env=environment, text=True,
                             capture_output=True)
     printed = [text.splitlines()[1:] for text in result.stdout.split(MARK)[1:]]
     if result.returncode == 0:
@@ -57,19 +58,19 @@ def run(commands, folder, compiler):
     return printed, [f"{commands[len(printed) - 1]} fails:", *printed[-1], result.stderr]
 
 
-def page_problems(folder, compiler):
-    # The build tree that is tested is the one that the first command would make.
+def page_problems(directory, compiler):
+    # The first command would make the build tree. The tested tree takes its place.
     shown = list(shown_commands((ROOT / "examples/README.md").read_text()))[1:]
-    printed, problems = run([command for command, _ in shown], folder, compiler)
+    printed, problems = run([command for command, _ in shown], directory, compiler)
     for (command, expected), lines in zip(shown, printed):
         if expected is not None and lines != expected:
             problems += [f"{command} prints:", *lines]
     return problems
 
 
-def header_problems(folder, compiler):
-    include = folder / "apktoolkit/include/apktoolkit"
-    environment = {**os.environ, "PKG_CONFIG_PATH": folder / "apktoolkit/lib/pkgconfig"}
+def header_problems(directory, compiler):
+    include = directory / "apktoolkit/include/apktoolkit"
+    environment = {**os.environ, "PKG_CONFIG_PATH": directory / "apktoolkit/lib/pkgconfig"}
     flags = subprocess.run(["pkg-config", "--cflags", "apktoolkit"], env=environment, check=True,
                            capture_output=True, text=True).stdout.split()
 
@@ -93,10 +94,10 @@ def main():
     if digest not in (ROOT / "examples/README.md").read_text():
         problems.append(f"examples/README.md does not show the signer's digest, {digest}")
     with tempfile.TemporaryDirectory() as name:
-        folder = pathlib.Path(name).resolve()
-        prepare(folder, pathlib.Path(build), pathlib.Path(package))
-        problems += page_problems(folder, compiler)
-        problems += header_problems(folder, compiler)
+        directory = pathlib.Path(name).resolve()
+        prepare(directory, pathlib.Path(build), pathlib.Path(package))
+        problems += page_problems(directory, compiler)
+        problems += header_problems(directory, compiler)
     return report(problems)
 
 

@@ -1,9 +1,9 @@
 #!/usr/bin/env python3
-"""Holds docs/messages.md against the sources, both ways.
+"""Compares docs/messages.md with the sources, in both directions.
 
-The tool's messages: text, priority and file. Of the simulator, the texts that it understands in the
-tool's log, and the rows of its causes, from which the tables of reasons on the page and the codes in
-docs/journal.schema.json are made: with --write both are brought up to date instead.
+Of the tool it compares each message's text, priority and file. Of the simulator it compares the
+texts that it understands in the tool's log, and the rows of its causes. The tables of reasons on
+the page and the codes in docs/journal.schema.json are made from these rows: --write updates both.
 """
 
 import re
@@ -17,7 +17,7 @@ LITERALS = r'(?:"(?:[^"\\]|\\.)*"\s*)+'
 CALL = re.compile(r"\b(LogInfo|LogError|Fail)\(\s*(%s|k\w+)" % LITERALS)
 CONSTANT = re.compile(r"constexpr char (k\w+)\[\] =\s*(%s)" % LITERALS)
 
-# What each function writes to, and what it puts before each text (Fail is crypto/pkcs7.cpp's).
+# For each function: where it writes to, and its prefix to each text (Fail is crypto/pkcs7.cpp's).
 WRITERS = {
     "LogInfo": ("Info", ""),
     "LogError": ("Error", ""),
@@ -59,7 +59,7 @@ CAUSE = re.compile(r"inline constexpr Cause (?P<name>k\w+) = \{\s*(?P<code>%s),\
                    r"\s*Severity::(?P<severity>k\w+),\s*ChainLink::(?P<link>k\w+),\s*(?P<log>%s),"
                    r"\s*(?P<reason>%s),\s*(?P<cure>%s)\};" % ((LITERALS,) * 4))
 
-# The groups in their order, with what stands above their tables.
+# The groups in order, each with the title of its table.
 GROUPS = {"kNotLookedAt": "The tool did not look at the file",
           "kSimulation": "The simulation could not tell", "kFile": "What the file is",
           "kSignature": "A package's signature", "kKernel": "The kernel", "kLibrary": "A library",
@@ -67,7 +67,7 @@ GROUPS = {"kNotLookedAt": "The tool did not look at the file",
           "kInstaller": "The installer of the phones",
           "kGate": "The gate: what the command line demands", "kWarning": "Warnings"}
 
-# Causes that leave the chain from the key to the entries whole: all others have to break it.
+# Groups of causes that leave the chain from the key to the entries whole. All others must break it.
 UNBROKEN = {"kKernel", "kKey", "kInstaller", "kGate", "kWarning"}
 
 PAGE = ROOT / "docs/messages.md"
@@ -86,7 +86,7 @@ def causes():
 
 
 def tables(rows):
-    """The tables of reasons as the page has them."""
+    """The tables of reasons as they should be on the page."""
     parts = []
     for group, title in GROUPS.items():
         lines = [f"| `{row['code']}` | {row['reason']} | {row['cure']} | {row['log']} |"
@@ -97,7 +97,7 @@ def tables(rows):
 
 
 def codes(rows):
-    """The list of codes as the schema has it."""
+    """The list of codes as it should be in the schema."""
     text = ", ".join(f'"{row["code"]}"' for row in rows)
     return "[\n" + textwrap.fill(text, 100, initial_indent=" " * 8, subsequent_indent=" " * 8,
                                  break_on_hyphens=False) + "\n      ]"
@@ -123,7 +123,7 @@ def reasons_problems(rows, messages):
     return problems
 
 
-# A row of the texts that the simulator understands: meaning, text, what is captured.
+# A row of the texts that the simulator understands: meaning, text, captured part.
 LOG_LINES = ROOT / "simulator/run/log_lines.cpp"
 LOG_TEXT = re.compile(r"\{LogMeaning::k\w+,\s*(%s),\s*(\d+|kNothing)\}" % LITERALS)
 

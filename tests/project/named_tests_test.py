@@ -1,14 +1,14 @@
 #!/usr/bin/env python3
-"""Holds the tests that the papers name against the tests that there are."""
+"""Checks that every test which the docs name exists."""
 
 import re
 import sys
 
 from sources import ROOT, report
 
-PAPERS = [ROOT / "README.md", *sorted((ROOT / "docs").rglob("*.md"))]
+PAGES = [ROOT / "README.md", *sorted((ROOT / "docs").rglob("*.md"))]
 
-# `Suite.Test`, `Suite.*`, or either with the prefix of a suite that is instantiated.
+# `Suite.Test`, `Suite.*`, or either with the prefix of an instantiated suite.
 NAMED = re.compile(r"`((?:\w+/)?[A-Z]\w+)\.(\*|[A-Z]\w+)`")
 DEFINED = re.compile(r"^TEST(?:_F|_P)?\(\s*(\w+),\s*(\w+)\)", re.M)
 INSTANTIATED = re.compile(r"INSTANTIATE_TEST_SUITE_P\(\s*(\w+),\s*(\w+),")
@@ -33,11 +33,11 @@ def main():
     tests = there_are()
     suites = {suite for suite, _ in tests}
     problems, count = [], 0
-    for paper in PAPERS:
-        for suite, test in NAMED.findall(paper.read_text()):
+    for page in PAGES:
+        for suite, test in NAMED.findall(page.read_text()):
             count += 1
             if (suite not in suites) if test == "*" else ((suite, test) not in tests):
-                problems.append(f"{paper.relative_to(ROOT)}: there is no test {suite}.{test}")
+                problems.append(f"{page.relative_to(ROOT)}: there is no test {suite}.{test}")
     if count < 50:
         problems.append(f"only {count} tests are named: the pattern misses them")
     return report(problems)

@@ -1,6 +1,7 @@
 #!/usr/bin/env python3
-"""Holds docs/porting.md against what it speaks of: the interface in the sources, the modules of the
-blueprint, the example of a JAR's key block, and the files of integration/, all of which it has to name."""
+"""Compares docs/porting.md with the project: the interface in the sources, the modules of the
+blueprint, the example of a JAR's key block, and the files of integration/, which it must all
+name."""
 
 import hashlib
 import re
@@ -18,7 +19,7 @@ def section(title):
 
 
 def interface_problems():
-    """Numbers and names, as they stand in the sources."""
+    """Numbers and names are those of the sources."""
     integrity = (ROOT / "sign/integrity.cpp").read_text()
     libzu = (ROOT / "sign/libzu.h").read_text()
     wanted = []
@@ -38,7 +39,7 @@ def interface_problems():
 
 
 def key_block_problems():
-    """The example's four digests, by Python."""
+    """Python computes the example's four digests."""
     text = section("ZuNewCertificate(fd, name, data, length)")
     path = re.search(r"^`(/\S+)`:", text, re.M)[1]
     digests, current = [], path.encode()
@@ -50,7 +51,7 @@ def key_block_problems():
 
 
 def module_problems():
-    """The table of modules has those of the blueprint that a product may name."""
+    """The table of modules has all modules of the blueprint that a product may name."""
     named = set(re.findall(r"^\| `(\w[\w-]*)` \|", section("In a platform tree"), re.M))
     built = {module["name"] for module in Blueprint(ROOT / "Android.bp").modules
              if module["type"] != "cc_defaults"}
@@ -58,7 +59,7 @@ def module_problems():
 
 
 def link_problems():
-    """What is linked is there, and of integration/ nothing is left unnamed."""
+    """Every linked file exists, and every file of integration/ is named."""
     problems = []
     for link in re.findall(r"\]\(([^)#]+)(?:#[^)]*)?\)", PAGE):
         if not (ROOT / "docs" / link).exists():

@@ -1,4 +1,4 @@
-"""What the tests of this folder read from the project's own files."""
+"""Reads the project's own files for the tests of this directory."""
 
 import os
 import pathlib
@@ -22,17 +22,17 @@ def without_comments(text):
     return token.sub(lambda match: match[0] if match[0].startswith('"') else " ", text)
 
 
-def path_with_simulator(folder, simulator):
-    """A search path on which apktoolkit-sim is what these words start, from a script in the folder."""
-    (folder / "bin").mkdir()
-    command = folder / "bin/apktoolkit-sim"
+def path_with_simulator(directory, simulator):
+    """A search path on which `apktoolkit-sim` runs these words, by a script in the directory."""
+    (directory / "bin").mkdir()
+    command = directory / "bin/apktoolkit-sim"
     command.write_text(f"#!/bin/sh\nexec {shlex.join(simulator)} \"$@\"\n")
     command.chmod(0o755)
-    return f"{folder}/bin:{os.environ['PATH']}"
+    return f"{directory}/bin:{os.environ['PATH']}"
 
 
 def report(problems):
-    """Prints the problems; the exit status of the test."""
+    """Prints the problems. Returns the exit status of the test."""
     for problem in problems:
         print(problem)
     return 1 if problems else 0

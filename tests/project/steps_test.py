@@ -1,6 +1,6 @@
 #!/usr/bin/env python3
-"""Holds the steps of scripts/check against what the papers say of them, and has scripts/check run
-steps that pass, fail and skip."""
+"""Compares the steps of scripts/check with the docs, and runs scripts/check with steps that pass,
+fail and skip."""
 
 import os
 import pathlib
@@ -23,7 +23,7 @@ def everyday_steps():
 
 
 def part(path, beginning, end):
-    """The text of the file between the two, patterns for whole lines."""
+    """The text of the file between two lines, given as patterns."""
     return re.search(rf"^{beginning}\n(.*?)^{end}$", (ROOT / path).read_text(), re.M | re.S)[1]
 
 
@@ -34,7 +34,7 @@ def known_to_setup():
 
 
 def setup_problems():
-    """Whatever is asked of scripts/setup is known to it."""
+    """scripts/setup knows every step that it is called with."""
     asked = {("scripts/check", step) for step in listed_steps()}
     for path in (ROOT / "scripts").iterdir():
         asked |= {(path.name, word) for words in re.findall(r"^ *scripts/setup ([\w ]+)$",
@@ -45,7 +45,7 @@ def setup_problems():
 
 
 def list_problems():
-    """Every step is a function, and the papers name it, in the same order."""
+    """Every step has a function, and the docs name the steps in the same order."""
     steps, everyday = listed_steps(), everyday_steps()
     functions = re.findall(r"^step_(\w+)\(\)", (ROOT / "scripts/check").read_text(), re.M)
     page = part("docs/testing.md", "## Steps", "## .*")
@@ -61,8 +61,8 @@ def list_problems():
     return problems
 
 
-def check(folder, *steps):
-    run = subprocess.run([folder / "scripts/check", *steps], capture_output=True, text=True)
+def check(directory, *steps):
+    run = subprocess.run([directory / "scripts/check", *steps], capture_output=True, text=True)
     return re.sub(r"\(\d+ s, ", "(N s, ", run.stdout).splitlines(), run.returncode
 
 
@@ -72,20 +72,20 @@ def write(path, content):
 
 
 def run_problems():
-    """What scripts/check makes of steps that end in every way."""
+    """scripts/check reports every way in which a step can end."""
     with tempfile.TemporaryDirectory() as name:
-        folder = pathlib.Path(name)
-        (folder / "scripts").mkdir()
-        shutil.copy(ROOT / "scripts/check", folder / "scripts")
-        write(folder / "scripts/setup", "true")
-        write(folder / "scripts/check-arrows", "echo arrow; echo all 3 are allowed")
-        write(folder / "scripts/format", "echo bad.cpp; exit 1")
-        write(folder / "scripts/run-tests", """echo "test $1 passed"
+        directory = pathlib.Path(name)
+        (directory / "scripts").mkdir()
+        shutil.copy(ROOT / "scripts/check", directory / "scripts")
+        write(directory / "scripts/setup", "true")
+        write(directory / "scripts/check-arrows", "echo arrow; echo all 3 are allowed")
+        write(directory / "scripts/format", "echo bad.cpp; exit 1")
+        write(directory / "scripts/run-tests", """echo "test $1 passed"
             echo "skipped A.B: no kernel"
             [[ $1 == release ]] || echo "FAILED A.C: one"
             echo "1 passed"
             [[ $1 == release ]]""")
-        found = check(folder, "arrows", "release", "format", "sanitize")
+        found = check(directory, "arrows", "release", "format", "sanitize")
         expected = (["arrows        all 3 are allowed (N s, build/logs/arrows.log)",
                      "release       1 passed (N s, build/logs/release.log)",
                      "    skipped A.B: no kernel",
@@ -97,55 +97,56 @@ def run_problems():
                      "    1 passed",
                      "steps: 2 passed, 2 failed, 0 skipped"], 1)
         problems = [] if found == expected else [f"scripts/check ends with {found}"]
-        if (found := check(folder, "arrows"))[1] != 0:
+        if (found := check(directory, "arrows"))[1] != 0:
             problems.append(f"scripts/check does not pass: {found}")
-        if (found := check(folder, "arrow"))[1] != 2:
+        if (found := check(directory, "arrow"))[1] != 2:
             problems.append(f"scripts/check takes a step that there is not: {found}")
-        write(folder / "scripts/bare-system", "echo on its way; echo skipped: no root; exit 77")
+        write(directory / "scripts/bare-system", "echo on its way; echo skipped: no root; exit 77")
         skipped = ["debian13      skipped: no root (N s, build/logs/debian13.log)"]
-        found = check(folder, "debian13", "arrows")
+        found = check(directory, "debian13", "arrows")
         if found != (skipped + expected[0][:1] + ["steps: 1 passed, 0 failed, 1 skipped"], 0):
             problems.append(f"scripts/check takes a skipped step for another: {found}")
-        found = check(folder, "debian13")
+        found = check(directory, "debian13")
         if found != (skipped + ["steps: 0 passed, 0 failed, 1 skipped"], 1):
             problems.append(f"scripts/check passes where no step ran: {found}")
-        write(folder / "scripts/setup", "exit 1")
-        if (found := check(folder, "arrows"))[1] == 0:
+        write(directory / "scripts/setup", "exit 1")
+        if (found := check(directory, "arrows"))[1] == 0:
             problems.append(f"scripts/check goes on without its packages: {found}")
     return problems
 
 
 def emulator_problems():
-    """Without an emulator scripts/kernel is a step that was skipped."""
+    """Without an emulator scripts/kernel is a skipped step."""
     with tempfile.TemporaryDirectory() as name:
-        folder = pathlib.Path(name)
-        (folder / "scripts").mkdir()
-        shutil.copy(ROOT / "scripts/kernel", folder / "scripts")
-        write(folder / "scripts/setup", "[[ $1 != emulator ]]")
-        run = subprocess.run([folder / "scripts/kernel"], capture_output=True, text=True)
-        expected = (77, "skipped: there is no qemu, and it cannot be installed\n")
+        directory = pathlib.Path(name)
+        (directory / "scripts").mkdir()
+        shutil.copy(ROOT / "scripts/kernel", directory / "scripts")
+        write(directory / "scripts/setup", "[[ $1 != emulator ]]")
+        run = subprocess.run([directory / "scripts/kernel"], capture_output=True, text=True)
+        expected = (77, "skipped: qemu is missing, and apt-get cannot install it\n")
         found = (run.returncode, run.stdout)
         return [] if found == expected else [f"scripts/kernel without qemu ends with {found}"]
 
 
 def skip_problems():
-    """scripts/bare-system says why it cannot be run here, and by its status that it was not."""
+    """scripts/bare-system prints why it cannot run here, and its status marks the step as skipped."""
     with tempfile.TemporaryDirectory() as name:
-        folder = pathlib.Path(name)
-        (folder / "scripts").mkdir()
-        shutil.copy(ROOT / "scripts/bare-system", folder / "scripts")
-        write(folder / "wget", "exit 4")
-        reasons = [("exit 1", "debootstrap is not there, and cannot be installed"),
-                   ("true", "there is no http://mirror.invalid/debian/dists/trixie/Release to be had")]
+        directory = pathlib.Path(name)
+        (directory / "scripts").mkdir()
+        shutil.copy(ROOT / "scripts/bare-system", directory / "scripts")
+        write(directory / "wget", "exit 4")
+        reasons = [("exit 1", "debootstrap is missing, and apt-get cannot install it"),
+                   ("true", "http://mirror.invalid/debian/dists/trixie/Release cannot be fetched")]
         for setup, reason in reasons:
-            write(folder / "scripts/setup", setup)
-            expected = reason if os.geteuid() == 0 else "a bare system can be made by root alone"
-            run = subprocess.run([folder / "scripts/bare-system", "13"], capture_output=True, text=True,
-                                 env={**os.environ, "PATH": f"{folder}:{os.environ['PATH']}",
+            write(directory / "scripts/setup", setup)
+            expected = reason if os.geteuid() == 0 else "only root can make a bare system"
+            run = subprocess.run([directory / "scripts/bare-system", "13"], capture_output=True, text=True,
+                                 env={**os.environ, "PATH": f"{directory}:{os.environ['PATH']}",
                                       "DEBIAN_MIRROR": "http://mirror.invalid/debian"}, check=False)
             if (run.returncode, run.stdout) != (77, f"skipped: {expected}\n"):
                 yield f"scripts/bare-system ends with {run.returncode}: {run.stdout}{run.stderr}"
 
 
 if __name__ == "__main__":
-    sys.exit(report(list_problems() + setup_problems() + run_problems() + emulator_problems() + list(skip_problems())))
+    sys.exit(report(list_problems() + setup_problems() + run_problems() + emulator_problems() +
+                    list(skip_problems())))

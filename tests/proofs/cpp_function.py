@@ -13,8 +13,8 @@ ROOT = pathlib.Path(__file__).resolve().parents[2]
 
 
 class Word:
-    """An unsigned number, with the operators of C++. What a product and a quotient are, a proof has
-    to say."""
+    """An unsigned number, with the operators of C++. A proof must define its products and
+    quotients."""
 
     product = quotient = None
 
@@ -69,7 +69,7 @@ class Word:
 
 
 class Answer(Word):
-    """What a comparison gives: a number, 0 or 1, and, where the run depends on it, a decision."""
+    """The result of a comparison: a number, 0 or 1, and a decision if the run depends on it."""
 
     runs = None
 
@@ -82,8 +82,8 @@ class Answer(Word):
 
 
 class Runs:
-    """All the runs of `function` that are possible where `assumptions` hold. Iterating gives, for
-    each, what holds on it and what it returns."""
+    """All possible runs of `function` under `assumptions`. Iterating gives, for each run, its
+    conditions and its result."""
 
     def __init__(self, function, assumptions, most=20):
         self.function, self.assumptions, self.most = function, assumptions, most
@@ -119,7 +119,7 @@ class Runs:
 
 
 class Pointer:
-    """Points at values: one, or a few."""
+    """Points at one value, or at a few."""
 
     def __init__(self, *values):
         self.values = list(values)
@@ -148,7 +148,7 @@ def load(path, name, **constants):
         try:
             scope[constant] = eval(expression(value), scope)
         except (NameError, SyntaxError):
-            pass  # not made of numbers alone
+            pass  # its values are not only numbers
     found = re.search(r"^(?!\s)[^\n;{}]*?\b%s\(([^;{}]*)\) \{\n(.*?)^\}" % name, text, re.S | re.M)
     if not found:
         raise AssertionError(f"{path} has no function {name}")
@@ -162,7 +162,7 @@ TYPE = r"(?:const )?(?:uint\d+_t|int|bool|lanes)\b ?\*?"
 
 
 def statements(body):
-    """The lines of a function's body in Python, each of which is indented by one space a block."""
+    """The lines of a function's body in Python. Each block indents them by one more space."""
     body = re.sub(r"\bif \((.*)\) (\w[^{;]*;)", r"if (\1) {\2}", body)
     body = re.sub(r"\b(for \(.*?;.*?;.*?\)) ([\w*][^{;]*;)", r"\1 {\2}", body)
     steps, lines = [], []
@@ -215,8 +215,8 @@ def simple(text):
 
 def expression(text):
     text = re.sub(r"static_cast<[^<>]*>", "", text)
-    text = re.sub(r"(?<![\w)\]] )(?<![\w)\]])\*(\w+)", r"\1[0]", text)  # what a pointer points at
-    text = re.sub(r"&(\w+)(?=[,)\[])", r"\1", text)  # an address that a call is given
+    text = re.sub(r"(?<![\w)\]] )(?<![\w)\]])\*(\w+)", r"\1[0]", text)  # the value that a pointer points at
+    text = re.sub(r"&(\w+)(?=[,)\[])", r"\1", text)  # an address that is passed to a call
     for cpp, python in (("->", "."), ("std::", ""), ("&&", " and "), ("||", " or "),
                         (" / ", " // "), ("false", "False"), ("true", "True")):
         text = text.replace(cpp, python)

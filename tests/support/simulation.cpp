@@ -9,8 +9,8 @@
 
 namespace {
 
-// The journal without the events that tell of the simulation and not of the phone, which come
-// before and after all others, and without the platform libraries' own log records.
+// The journal without the platform libraries' own log records and without the events about the
+// simulation itself, which come before and after all others.
 std::string TimelineOf(const std::string& journal) {
   std::istringstream lines(journal);
   std::string line;
