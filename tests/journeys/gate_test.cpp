@@ -83,8 +83,9 @@ Lines WarningsOf(const Package& package, const Lines& options = {}) {
   package.WriteTo(folder / "base.apk");
   Lines words = options;
   words.push_back(folder / "base.apk");
+  const json warnings = Events(words).at(0)["warnings"];
   Lines codes;
-  for (const json& warning : Events(words).at(0)["warnings"]) {
+  for (const json& warning : warnings) {
     codes.push_back(warning["reason"]);
   }
   return codes;
@@ -183,8 +184,10 @@ TEST(Werror, WarningsCountAsRefusals) {
 TEST(Warning, OfWeakDigestsNamesEachUse) {
   const auto text = [](const std::string& name) {
     const json warnings = Events({Apk(name)}).at(0)["warnings"];
-    EXPECT_EQ(warnings.size(), 1U) << warnings;
-    return warnings.empty() ? "" : warnings[0]["text"].get<std::string>();
+    for (const json& warning : warnings) {
+      if (warning["reason"] == "weak-digest") return warning["text"].get<std::string>();
+    }
+    return std::string();
   };
   EXPECT_EQ(text("openssl-cms-md5"),
             "SHA-1 or MD5 is in use: the signature block is made with MD5");
