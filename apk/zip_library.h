@@ -22,7 +22,7 @@ inline constexpr int32_t kZipInvalidEntryName = -10;
 // The longest name that a zip archive, and a `ZipString`, can hold, in bytes.
 inline constexpr size_t kZipLongestName = 0xffff;
 
-// The type of a name in the library at hand. The first overload exists only if FindEntry takes a
+// The type of a name in the installed library. The first overload exists only if FindEntry takes a
 // std::string_view, that is, in the later generation.
 template <typename Entry>
 auto ZipNameFor(Entry* entry)

@@ -75,7 +75,7 @@ TEST(EntryDigests, OfEqualNamesTheLaterSectionCountsInAnyOrder) {
   EXPECT_EQ("SHA-256-Digest 3", unordered.Of("b"));
 }
 
-// So many equal names that a sort which is stable only for few would not keep their order.
+// There are too many equal names for a sort that is stable only for a few.
 TEST(EntryDigests, OfManyEqualNamesTheLastSectionCounts) {
   std::string sections = Section("z", "0");
   for (int i = 1; i <= 100; ++i) sections += Section(i % 2 == 0 ? "a" : "b", std::to_string(i));
@@ -171,7 +171,7 @@ TEST(EntryDigests, NothingIsListedBeforeListIsCalled) {
   EXPECT_TRUE(digests.Find("a", digest_name, digest));
 }
 
-// Whether the new manifest parses or not, nothing is left of the one before.
+// Nothing is left of the first manifest, even if the second one does not parse.
 TEST(EntryDigests, LoadingAnotherManifestForgetsTheFirst) {
   LogCapture log;
   for (const std::string& other : {Section("b", "2"), std::string("Key:x")}) {

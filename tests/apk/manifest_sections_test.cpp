@@ -106,8 +106,8 @@ TEST(ManifestSection, FindsTheLastNameThatEndsSo) {
   EXPECT_EQ(std::make_pair(std::string_view(), std::string_view()), section.findLastEndingIn("-Q"));
 }
 
-// So many equal names that a sort which is stable only for few would not keep their order. Other
-// sections come between, so that the table grows inside a section.
+// There are too many equal names for a sort that is stable only for a few. Other sections come
+// between, so that the table grows inside a section.
 TEST(ManifestSection, OfEqualNamesTheLastInTheTextCounts) {
   std::mt19937 random(1);
   Table table(8 << 20);

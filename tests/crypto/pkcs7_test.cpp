@@ -122,8 +122,8 @@ TEST(ProcessCertHeader, HeaderThatWouldStartAtOrBeyondTheEndHasTagZero) {
 }
 
 TEST(ProcessCertHeader, LengthsAreComparedWithTheWholeBlockFromEachPosition) {
-  // Of the elements before the certificates, the SignedData may end beyond the block. Its length
-  // may be the block's, less its own header, at most.
+  // One element before the certificates, the SignedData, may end beyond the block. Its length may
+  // be the block's, less its own header, at most.
   Bytes bytes = WithRsaKey(Bytes(64, 0x77), {3}).Build(kSignatureFile);
   const size_t signed_data = Find(bytes, FromHex("02 01 01 31")) - 4;
   ASSERT_EQ(bytes[signed_data + 1], 0x82);
