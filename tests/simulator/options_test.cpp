@@ -48,7 +48,7 @@ TEST(Options, DefaultIsAHealthyPhone) {
   EXPECT_EQ(options.run.tool, ProgramDirectory() + "/apktoolkit");
   EXPECT_EQ(options.run.runner, Lines());
   EXPECT_EQ(options.run.timeout, 30);
-  EXPECT_EQ(options.run.abi, std::nullopt);
+  EXPECT_EQ(options.run.abi, InstalledAbi::kPreferred);
   EXPECT_FALSE(options.judge.is_strict);
   EXPECT_EQ(options.show.detail, Detail::kUsual);
   EXPECT_EQ(options.run.jobs, 1U);
@@ -156,7 +156,7 @@ TEST(Options, SignersAreDigestsInOneForm) {
   for (int i = 1; i < 32; ++i) pairs += ":aA";
   const Options options = Parsed({"--signer", digest, "--signer=" + pairs, "a.apk", "b.apk"});
   EXPECT_EQ(options.gate.signers, Lines({digest, digest}));
-  EXPECT_EQ(options.files, Lines({"a.apk", "b.apk"}));
+  EXPECT_EQ(options.files.names, Lines({"a.apk", "b.apk"}));
   EXPECT_EQ(Parsed({"a.apk"}).gate.signers, Lines());
 }
 
