@@ -49,8 +49,8 @@ def runs(package, directory):
     yield ["--strict", "--install=no", alone]
     yield ["--signer", "0" * 64, alone]
     yield ["--install", alone]
-    (folder / "empty").mkdir()
-    yield ["--recursive", folder / "empty"]
+    (directory / "empty").mkdir()
+    yield ["--recursive", directory / "empty"]
     yield [damaged]
     yield [odd_name]
 
