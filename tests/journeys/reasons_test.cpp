@@ -170,8 +170,8 @@ TEST_F(Reason, AnotherKeyIsAnotherSignerAndRotationDoesNotHelp) {
     ASSERT_GT(told.size(), 5U);
     EXPECT_EQ(told[2] + told[3] + told[4],
               "      Sign it with an RSA key of 2048 to 4096 bits. That is another signer:"
-              "      phones refuse it as an update of a published app. Rotation does not"
-              "      help: the JAR signature stays the first key's.")
+              "      phones refuse it as an update of a published app. Rotation does not help:"
+              "      the JAR signature stays the first key's.")
         << name;
   }
 }
