@@ -101,12 +101,16 @@ void Walk(const std::string& root, FileList* list) {
   std::move(found.begin(), found.end(), std::back_inserter(list->files));
 }
 
-// A link to a directory is neither walked nor a file.
+// A link to a directory is neither walked nor a file. What cannot be told to be one or the other is
+// told as a directory: its path is too long, for example.
 void AddEntry(const fs::directory_entry& entry, std::vector<std::string>* directories,
               std::vector<ListedFile>* found, size_t* others) {
   std::error_code error;
   const std::string path = entry.path().string();
-  if (fs::is_directory(entry.symlink_status(error))) {
+  const fs::file_status status = entry.symlink_status(error);
+  if (status.type() == fs::file_type::none) {
+    found->push_back({path, ListedFile::State::kUnreadable, error.value()});
+  } else if (fs::is_directory(status)) {
     directories->push_back(path);
   } else if (entry.is_directory(error)) {
     return;

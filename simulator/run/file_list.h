@@ -19,7 +19,7 @@ struct FileListOptions {
 struct ListedFile {
   enum class State {
     kToRun,            // the tool is run for it
-    kUnreadable,       // a directory that is walked, and cannot be read to its end: `error`
+    kUnreadable,       // below a walked directory, and cannot be read to its end: `error`
     kWithoutPackages,  // a directory that is walked, with no package in it or below it
   };
 

@@ -17,6 +17,7 @@
 #include "simulator/package/android_manifest.h"
 #include "simulator/package/archive.h"
 #include "simulator/phone/text.h"
+#include "util/file.h"
 #include "util/scoped_fd.h"
 
 namespace simulator {
@@ -32,7 +33,7 @@ constexpr const char* kPhoneAbis[] = {"arm64-v8a", "armeabi-v7a", "armeabi"};
 using Layout = std::map<std::string, std::string>;
 
 std::vector<std::string> LibraryNames(const Archive& archive);
-bool LiesAlone(const std::string& file, int source, const std::vector<std::string>& libraries);
+bool LiesAlone(int package, const std::vector<std::string>& libraries);
 Layout PlanLayout(const std::vector<std::string>& entries, InstalledAbi choice,
                   std::vector<std::string>* left_out, std::set<std::string>* of_other_processors);
 bool IsNameForInstallers(const std::string& entry);
@@ -65,7 +66,7 @@ std::optional<std::string> Installation::LayOut(const std::string& file, Install
   if (archive.Read(kAndroidManifestName, &manifest) == Archive::ReadResult::kMissing) return {};
   if (ParseAndroidManifest(manifest).extracts_libraries == false) return {};
   const std::vector<std::string> libraries = LibraryNames(archive);
-  if (when == InstallWhen::kAlone && !LiesAlone(file, source.get(), libraries)) return {};
+  if (when == InstallWhen::kAlone && !LiesAlone(source.get(), libraries)) return {};
   const Layout layout = PlanLayout(libraries, abi, &left_out_, &of_other_processors_);
   if (layout.empty()) return {};
 
@@ -125,10 +126,13 @@ std::vector<std::string> LibraryNames(const Archive& archive) {
 }
 
 // Neither a directory of the installer's nor a place where the tool looks for a library is there.
-// A file on a read-only file system is left to the tool, which has an answer of its own for it.
-bool LiesAlone(const std::string& file, int source, const std::vector<std::string>& libraries) {
+// Looked for beside the open file, as the tool does, and not beside a link to it. A file on a
+// read-only file system is left to the tool, which has an answer of its own for it.
+bool LiesAlone(int package, const std::vector<std::string>& libraries) {
+  const std::string file = GetFilenameByFd(package);
   struct statvfs system = {};
-  if (fstatvfs(source, &system) != 0 || (system.f_flag & ST_RDONLY) != 0) return false;
+  if (file.empty() || fstatvfs(package, &system) != 0 || (system.f_flag & ST_RDONLY) != 0)
+    return false;
   const auto is_there = [](const std::string& path) {
     struct stat state = {};
     return lstat(path.c_str(), &state) == 0 || (errno != ENOENT && errno != ENOTDIR);

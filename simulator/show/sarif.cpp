@@ -19,6 +19,11 @@ nlohmann::ordered_json Message(const std::string& text) {
   return {{"text", Printable(text, {false, true})}};
 }
 
+// A byte that is not UTF-8 becomes U+FFFD.
+std::string TextOf(const nlohmann::ordered_json& value, int indent = -1) {
+  return value.dump(indent, ' ', false, nlohmann::ordered_json::error_handler_t::replace);
+}
+
 }  // namespace
 
 void Sarif::Add(const Report& report) {
@@ -50,7 +55,7 @@ std::string Sarif::Log() const {
                     {"artifacts", artifacts_},
                     {"results", results_}};
   const Json log = {{"$schema", kSchema}, {"version", "2.1.0"}, {"runs", Json::array({run})}};
-  return log.dump(kIndent, ' ', false, Json::error_handler_t::replace) + "\n";
+  return TextOf(log, kIndent) + "\n";
 }
 
 // The same file with the same bytes stands there once.
@@ -61,7 +66,7 @@ size_t Sarif::AddArtifact(const Report& report) {
     artifact["length"] = report.file_size;
     artifact["hashes"] = {{"sha-256", report.file_sha256}};
   }
-  const auto& [place, is_new] = artifact_of_.emplace(artifact.dump(), artifacts_.size());
+  const auto& [place, is_new] = artifact_of_.emplace(TextOf(artifact), artifacts_.size());
   if (is_new) artifacts_.push_back(std::move(artifact));
   return place->second;
 }

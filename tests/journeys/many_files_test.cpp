@@ -105,8 +105,9 @@ TEST_F(ManyFiles, NamesComeFromAList) {
   EXPECT_EQ(Told(Do("cp good/base.apk $'two\\nlines.apk';"
                     "find . -name '*lines.apk' -print0 | sim --files-from - -0")),
             Lines({"SIGNED  ./two\\x0alines.apk", "-> 0"}));
-  EXPECT_EQ(Told(Do("echo good | sim --recursive --files-from=- --null shop/unsigned.apk")),
-            Lines({"REFUSED  shop/unsigned.apk", "NOT LOOKED AT  good\\x0a", "-> 4"}));
+  EXPECT_EQ(
+      Told(Do("printf 'good\\nshop' | sim --recursive --files-from=- --null shop/unsigned.apk")),
+      Lines({"REFUSED  shop/unsigned.apk", "NOT LOOKED AT  good\\x0ashop", "-> 4"}));
 }
 
 TEST_F(ManyFiles, ListThatNamesNothingIsNoSuccess) {

@@ -48,6 +48,7 @@ TEST(Options, DefaultIsAHealthyPhone) {
   EXPECT_EQ(options.run.tool, ProgramDirectory() + "/apktoolkit");
   EXPECT_EQ(options.run.runner, Lines());
   EXPECT_EQ(options.run.timeout, 30);
+  EXPECT_EQ(options.run.install, InstallWhen::kAlone);
   EXPECT_EQ(options.run.abi, InstalledAbi::kPreferred);
   EXPECT_FALSE(options.judge.is_strict);
   EXPECT_EQ(options.show.detail, Detail::kUsual);

@@ -356,7 +356,8 @@ TEST(Simulation, SurvivesAFileThatShrinksAndGoesOnToTheNext) {
       "export ASAN_OPTIONS=\"$ASAN_OPTIONS:handle_sigbus=0\"\n"
       "cd \"$1\"; sim=$2; cp whole.apk base.apk\n"
       "(while [ ! -e end ]; do truncate -s 3000 base.apk; cp whole.apk base.apk; done) & loop=$!\n"
-      "for i in $(seq 30); do \"$sim\" --installer=off --quiet base.apk good.apk >out; status=$?\n"
+      "for i in $(seq 30); do\n"
+      "  \"$sim\" --installer=off --install=no --quiet base.apk good.apk >out; status=$?\n"
       "  [ $status = 1 ] || [ $status = 0 ] || echo \"status $status\"\n"
       "  grep -q '^SIGNED  good.apk' out || cat out\ndone; touch end; wait $loop";
   const ProcessResult result =

@@ -323,6 +323,15 @@ TEST(Installation, IsMadeOfAPackageThatLiesAlone) {
     EXPECT_TRUE(is_laid_out(InstallWhen::kAlways)) << place;
     fs::remove_all(folder / "lib");
   }
+  // A link lies elsewhere, and the tool looks beside the package.
+  const TempDir links;
+  fs::create_symlink(file, links / "base.apk");
+  fs::create_directories(folder / "lib/arm64");
+  Installation of_link;
+  EXPECT_EQ(of_link.LayOut(links / "base.apk", InstallWhen::kAlone, InstalledAbi::kAll, kLater),
+            std::nullopt);
+  EXPECT_FALSE(of_link.is_done());
+  fs::remove_all(folder / "lib");
   // Nobody can tell whether there is one.
   fs::create_symlink("lib", folder / "lib");
   EXPECT_FALSE(is_laid_out(InstallWhen::kAlone));
