@@ -1,6 +1,6 @@
 #!/usr/bin/env python3
-"""Holds the steps of scripts/check against what the papers say of them, and has scripts/check run
-steps that pass, fail and skip."""
+"""Writes the table of steps in docs/testing.md from scripts/check, and has scripts/check run steps that
+pass, fail and skip."""
 
 import os
 import pathlib
@@ -13,13 +13,27 @@ import tempfile
 from sources import ROOT, report
 
 
+PAGE = ROOT / "docs/testing.md"
+FIX = "the table at the head of scripts/check, a function below it, and groups_of in scripts/setup"
+
+
 def listed_steps():
+    """Each step of scripts/check, with what its table says of it."""
     table = re.search(r"^steps='\n(.*?)\n'$", (ROOT / "scripts/check").read_text(), re.M | re.S)
-    return [line.split()[0] for line in table[1].splitlines()]
+    return dict(line.split(maxsplit=1) for line in table[1].splitlines())
 
 
 def everyday_steps():
     return re.search(r"/check\" (.*)", (ROOT / "scripts/test").read_text())[1].split()
+
+
+def page_with_steps():
+    """docs/testing.md, with its table as scripts/check has it."""
+    everyday = everyday_steps()
+    rows = "".join(f"| `{step}`{' *' if step in everyday else ''} | {text} |\n"
+                   for step, text in listed_steps().items())
+    return re.sub(r"(?<=^\| Step \| What it does \|\n\|---\|---\|\n)(\|.*\n)*", lambda _: rows, PAGE.read_text(),
+                  flags=re.M)
 
 
 def part(path, beginning, end):
@@ -45,20 +59,12 @@ def setup_problems():
 
 
 def list_problems():
-    """Every step is a function, and the papers name it, in the same order."""
-    steps, everyday = listed_steps(), everyday_steps()
+    """Every step is a function, in the same order, and README.md shows the everyday ones."""
     functions = re.findall(r"^step_(\w+)\(\)", (ROOT / "scripts/check").read_text(), re.M)
-    page = part("docs/testing.md", "## Steps", "## .*")
-    shown = part("README.md", r"\$ scripts/test", "```")
-    problems = []
-    for what, found, expected in (
-            ("functions", functions, steps),
-            ("docs/testing.md", re.findall(r"^\| `(\w+)`", page, re.M), steps),
-            ("docs/testing.md, with a star", re.findall(r"^\| `(\w+)` \*", page, re.M), everyday),
-            ("README.md", re.findall(r"^([a-z]\w+) .*build/logs", shown, re.M), everyday)):
-        if found != expected:
-            problems.append(f"{what}: {found} in place of {expected}")
-    return problems
+    shown = re.findall(r"^([a-z]\w+) .*build/logs", part("README.md", r"\$ scripts/test", "```"), re.M)
+    return [f"{what}: {found} in place of {expected}"
+            for what, found, expected in (("functions of scripts/check", functions, list(listed_steps())),
+                                          ("README.md", shown, everyday_steps())) if found != expected]
 
 
 def check(folder, *steps):
@@ -148,4 +154,5 @@ def skip_problems():
 
 
 if __name__ == "__main__":
-    sys.exit(report(list_problems() + setup_problems() + run_problems() + emulator_problems() + list(skip_problems())))
+    sys.exit(report([*list_problems(), *setup_problems(), *run_problems(), *emulator_problems(), *skip_problems()],
+                    FIX, {PAGE: page_with_steps()}))
