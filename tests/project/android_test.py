@@ -12,8 +12,7 @@ from sources import ROOT, report
 LATER = {
     "int memfd_create(const char*, unsigned);": ("memfd_create", 'memfd_create("", 0)'),
     "long getrandom(void*, unsigned long, unsigned);": ("getrandom", "getrandom(0, 0, 0)"),
-    "void* reallocarray(void*, unsigned long, unsigned long);": ("reallocarray",
-                                                                 "reallocarray(0, 1, 1) != 0"),
+    "void* reallocarray(void*, unsigned long, unsigned long);": ("reallocarray", "reallocarray(0, 1, 1) != 0"),
     "bool _ZNSt3__14__fs10filesystem8__statusERKNS1_4pathEPNS_10error_codeE(void*, void*);": (
         "std::__1::__fs::filesystem::__status",
         "_ZNSt3__14__fs10filesystem8__statusERKNS1_4pathEPNS_10error_codeE(0, 0)"),
@@ -25,8 +24,7 @@ OWN = "int Own() { return 1; }"
 def compiled(folder, name, text):
     source, built = folder / f"{name}.cpp", folder / f"{name}.o"
     source.write_text('extern "C" {\n' + text + "\n}\n")
-    subprocess.run(["clang++", "--target=aarch64-linux-android27", "-c", source, "-o", built],
-                   check=True)
+    subprocess.run(["clang++", "--target=aarch64-linux-android27", "-c", source, "-o", built], check=True)
     return built
 
 
@@ -53,7 +51,7 @@ def main():
                 problems.append(f"{symbol} is not noticed: {result.stdout}")
         if compare().returncode == 0:
             problems.append("no object at all is taken for good ones")
-    return report(problems)
+    return report(problems, "scripts/android: its function compare")
 
 
 if __name__ == "__main__":

@@ -5,7 +5,6 @@ examples/README.md shows, and compiles each installed header alone.
 Arguments: the build tree, the compiler, and the folder of a good package.
 """
 
-import concurrent.futures
 import os
 import pathlib
 import re
@@ -13,19 +12,10 @@ import shutil
 import subprocess
 import sys
 import tempfile
-import zipfile
 
-from sources import ROOT, report
+from sources import ROOT, changed_zip, report, shown_commands
 
 MARK = "== next command"
-
-
-def change_manifest(package, out):
-    """A copy of the package with one attribute more in its signed manifest."""
-    with zipfile.ZipFile(package) as source, zipfile.ZipFile(out, "w") as copy:
-        for name in source.namelist():
-            more = b"X: y\r\n" if name == "META-INF/MANIFEST.MF" else b""
-            copy.writestr(name, source.read(name) + more)
 
 
 def prepare(folder, build, package):
@@ -34,15 +24,8 @@ def prepare(folder, build, package):
     (folder / "build").mkdir()
     (folder / "build/release").symlink_to(build)
     shutil.copy(package / "base.apk", folder)
-    change_manifest(package / "base.apk", folder / "changed.apk")
-
-
-def shown_commands(page):
-    """The page's commands, each with the lines that it is said to print; None is for any."""
-    for block in re.findall(r"^```\n(\$ .*?)\n```$", page, re.M | re.S):
-        for command in re.split(r"^\$ ", block, flags=re.M)[1:]:
-            command, *lines = command.splitlines()
-            yield command, None if lines == ["..."] else lines
+    changed_zip(package / "base.apk", lambda name, content: content + (b"X: y\r\n" if name.endswith(".MF") else b""),
+                folder / "changed.apk")
 
 
 def run(commands, folder, compiler):
@@ -59,31 +42,29 @@ def run(commands, folder, compiler):
 
 def page_problems(folder, compiler):
     # The build tree that is tested is the one that the first command would make.
-    shown = list(shown_commands((ROOT / "examples/README.md").read_text()))[1:]
+    blocks = re.findall(r"^```\n(\$ .*?)\n```$", (ROOT / "examples/README.md").read_text(), re.M | re.S)
+    shown = [command for block in blocks for command in shown_commands(block)][1:]
     printed, problems = run([command for command, _ in shown], folder, compiler)
     for (command, expected), lines in zip(shown, printed):
-        if expected is not None and lines != expected:
+        if expected != ["..."] and lines != expected:
             problems += [f"{command} prints:", *lines]
     return problems
 
 
 def header_problems(folder, compiler):
     include = folder / "apktoolkit/include/apktoolkit"
-    environment = {**os.environ, "PKG_CONFIG_PATH": folder / "apktoolkit/lib/pkgconfig"}
-    flags = subprocess.run(["pkg-config", "--cflags", "apktoolkit"], env=environment, check=True,
+    flags = subprocess.run(["pkg-config", "--cflags", folder / "apktoolkit/lib/pkgconfig/apktoolkit.pc"], check=True,
                            capture_output=True, text=True).stdout.split()
 
-    def compile_alone(header):
-        name = header.relative_to(include)
-        result = subprocess.run(
-            [compiler, "-std=c++17", "-Wall", "-Wextra", "-Werror", *flags, "-fsyntax-only", "-x",
-             "c++", "-"], input=f'#include "{name}"\n', capture_output=True, text=True)
-        return [] if result.returncode == 0 else [f"{name} does not compile alone", result.stderr]
-
-    headers = sorted(include.rglob("*.h"))
-    with concurrent.futures.ThreadPoolExecutor(os.cpu_count()) as pool:
-        found = list(pool.map(compile_alone, headers))
-    return sum(found, [] if headers else ["no header is installed"])
+    sources = []
+    for header in include.rglob("*.h"):
+        sources.append(folder / f"alone{len(sources)}.cpp")
+        sources[-1].write_text(f'#include "{header.relative_to(include)}"\n')
+    result = subprocess.run([compiler, "-std=c++17", "-Wall", "-Wextra", "-Werror", *flags, "-fsyntax-only", *sources],
+                            capture_output=True, text=True)
+    if not sources:
+        return ["no header is installed"]
+    return [] if result.returncode == 0 else ["a header does not compile alone:", result.stderr]
 
 
 def main():
@@ -97,7 +78,7 @@ def main():
         prepare(folder, pathlib.Path(build), pathlib.Path(package))
         problems += page_problems(folder, compiler)
         problems += header_problems(folder, compiler)
-    return report(problems)
+    return report(problems, "examples/README.md, or cmake/Library.cmake, which installs the library")
 
 
 if __name__ == "__main__":

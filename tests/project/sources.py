@@ -10,7 +10,9 @@ import os
 import pathlib
 import re
 import shlex
+import subprocess
 import sys
+import zipfile
 
 WRITES = sys.argv[1:2] == ["--write"]
 if WRITES:
@@ -32,13 +34,30 @@ def without_comments(text):
     return token.sub(lambda match: match[0] if match[0].startswith('"') else " ", text)
 
 
-def path_with_simulator(folder, simulator):
-    """A search path on which apktoolkit-sim is what these words start, from a script in the folder."""
-    (folder / "bin").mkdir()
-    command = folder / "bin/apktoolkit-sim"
-    command.write_text(f"#!/bin/sh\nexec {shlex.join(simulator)} \"$@\"\n")
-    command.chmod(0o755)
-    return f"{folder}/bin:{os.environ['PATH']}"
+class Shell:
+    """A shell in the directory, in which these words start apktoolkit-sim. A command finds the files and the
+    status that the one before it left."""
+
+    def __init__(self, folder, simulator):
+        self.folder, self.status = folder, 0
+        (folder / "bin").mkdir()
+        command = folder / "bin/apktoolkit-sim"
+        command.write_text(f"#!/bin/sh\nexec {shlex.join(simulator)} \"$@\"\n")
+        command.chmod(0o755)
+        self.environment = {**os.environ, "PATH": f"{folder}/bin:{os.environ['PATH']}", "LC_ALL": "C.UTF-8"}
+
+    def run(self, command, stderr=subprocess.STDOUT):
+        run = subprocess.run(["bash", "-c", f"(exit {self.status})\n{command}"], cwd=self.folder, text=True,
+                             env=self.environment, stdout=subprocess.PIPE, stderr=stderr)
+        self.status = run.returncode
+        return run
+
+
+def changed_zip(archive, change, out):
+    """A copy of the zip archive, with what change(name, content) makes of each entry."""
+    with zipfile.ZipFile(archive) as source, zipfile.ZipFile(out, "w") as copy:
+        for name in source.namelist():
+            copy.writestr(name, change(name, source.read(name)))
 
 
 def shown_commands(block):
@@ -54,21 +73,16 @@ def report(problems, fix="", pages=None):
     `fix`: the file or the command that fixes the problems. `pages`: by its path, the text that each
     page with generated parts must have.
     """
-    problems, is_stale = list(problems), False
-    for path, right in (pages or {}).items():
-        found = path.read_text()
-        if found == right:
-            continue
+    problems, stale = list(problems), {path: right for path, right in (pages or {}).items() if path.read_text() != right}
+    for path, right in stale.items():
         if WRITES:
             path.write_text(right)
-            continue
-        is_stale = True
-        print(*difflib.unified_diff(found.splitlines(), right.splitlines(), str(path.relative_to(ROOT)),
-                                    "as the sources have it", lineterm="", n=0), sep="\n")
+        else:
+            print(*difflib.unified_diff(path.read_text().splitlines(), right.splitlines(), f"{path.relative_to(ROOT)}",
+                                        "as the sources have it", lineterm="", n=0), sep="\n")
+    is_stale = stale and not WRITES
     if is_stale:
         print("To fix this:", shlex.join([sys.executable, "-B", sys.argv[0], "--write", *sys.argv[1:]]))
-    for problem in problems:
-        print(problem)
     if problems:
-        print("To fix this:", fix)
+        print(*problems, f"To fix this: {fix}", sep="\n")
     return 1 if problems or is_stale else 0

@@ -2,6 +2,7 @@
 """Writes the table of steps in docs/testing.md from scripts/check, and has scripts/check run steps that
 pass, fail and skip."""
 
+import contextlib
 import os
 import pathlib
 import re
@@ -72,6 +73,15 @@ def check(folder, *steps):
     return re.sub(r"\(\d+ s, ", "(N s, ", run.stdout).splitlines(), run.returncode
 
 
+@contextlib.contextmanager
+def scripts(name):
+    """A directory with a copy of this script alone."""
+    with tempfile.TemporaryDirectory() as folder:
+        (pathlib.Path(folder) / "scripts").mkdir()
+        shutil.copy(ROOT / "scripts" / name, pathlib.Path(folder) / "scripts")
+        yield pathlib.Path(folder)
+
+
 def write(path, content):
     path.write_text("#!/bin/bash\n" + content)
     path.chmod(0o755)
@@ -79,10 +89,7 @@ def write(path, content):
 
 def run_problems():
     """What scripts/check makes of steps that end in every way."""
-    with tempfile.TemporaryDirectory() as name:
-        folder = pathlib.Path(name)
-        (folder / "scripts").mkdir()
-        shutil.copy(ROOT / "scripts/check", folder / "scripts")
+    with scripts("check") as folder:
         write(folder / "scripts/setup", "true")
         write(folder / "scripts/check-arrows", "echo arrow; echo all 3 are allowed")
         write(folder / "scripts/format", "echo bad.cpp; exit 1")
@@ -91,68 +98,44 @@ def run_problems():
             [[ $1 == release ]] || echo "FAILED A.C: one"
             echo "1 passed"
             [[ $1 == release ]]""")
-        found = check(folder, "arrows", "release", "format", "sanitize")
-        expected = (["arrows        all 3 are allowed (N s, build/logs/arrows.log)",
-                     "release       1 passed (N s, build/logs/release.log)",
-                     "    skipped A.B: no kernel",
-                     "format        FAILED (N s, build/logs/format.log)",
-                     "    bad.cpp",
-                     "sanitize      FAILED (N s, build/logs/sanitize.log)",
-                     "    skipped A.B: no kernel",
-                     "    FAILED A.C: one",
-                     "    1 passed",
-                     "steps: 2 passed, 2 failed, 0 skipped"], 1)
-        problems = [] if found == expected else [f"scripts/check ends with {found}"]
-        if (found := check(folder, "arrows"))[1] != 0:
-            problems.append(f"scripts/check does not pass: {found}")
-        if (found := check(folder, "arrow"))[1] != 2:
-            problems.append(f"scripts/check takes a step that there is not: {found}")
         write(folder / "scripts/bare-system", "echo on its way; echo skipped: no root; exit 77")
-        skipped = ["debian13      skipped: no root (N s, build/logs/debian13.log)"]
-        found = check(folder, "debian13", "arrows")
-        if found != (skipped + expected[0][:1] + ["steps: 1 passed, 0 failed, 1 skipped"], 0):
-            problems.append(f"scripts/check takes a skipped step for another: {found}")
-        found = check(folder, "debian13")
-        if found != (skipped + ["steps: 0 passed, 0 failed, 1 skipped"], 1):
-            problems.append(f"scripts/check passes where no step ran: {found}")
+        arrows = "arrows        all 3 are allowed (N s, build/logs/arrows.log)"
+        skipped = "debian13      skipped: no root (N s, build/logs/debian13.log)"
+        for steps, printed, status in (
+                ("arrows release format sanitize",
+                 [arrows, "release       1 passed (N s, build/logs/release.log)", "    skipped A.B: no kernel",
+                  "format        FAILED (N s, build/logs/format.log)", "    bad.cpp",
+                  "sanitize      FAILED (N s, build/logs/sanitize.log)", "    skipped A.B: no kernel",
+                  "    FAILED A.C: one", "    1 passed", "steps: 2 passed, 2 failed, 0 skipped"], 1),
+                ("arrows", [arrows, "steps: 1 passed, 0 failed, 0 skipped"], 0),
+                ("arrow", [], 2),
+                ("debian13 arrows", [skipped, arrows, "steps: 1 passed, 0 failed, 1 skipped"], 0),
+                ("debian13", [skipped, "steps: 0 passed, 0 failed, 1 skipped"], 1)):
+            if (found := check(folder, *steps.split())) != (printed, status):
+                yield f"scripts/check {steps} ends with {found}"
         write(folder / "scripts/setup", "exit 1")
         if (found := check(folder, "arrows"))[1] == 0:
-            problems.append(f"scripts/check goes on without its packages: {found}")
-    return problems
-
-
-def emulator_problems():
-    """Without an emulator scripts/kernel is a step that was skipped."""
-    with tempfile.TemporaryDirectory() as name:
-        folder = pathlib.Path(name)
-        (folder / "scripts").mkdir()
-        shutil.copy(ROOT / "scripts/kernel", folder / "scripts")
-        write(folder / "scripts/setup", "[[ $1 != emulator ]]")
-        run = subprocess.run([folder / "scripts/kernel"], capture_output=True, text=True)
-        expected = (77, "skipped: there is no qemu, and it cannot be installed\n")
-        found = (run.returncode, run.stdout)
-        return [] if found == expected else [f"scripts/kernel without qemu ends with {found}"]
+            yield f"scripts/check goes on without its packages: {found}"
 
 
 def skip_problems():
-    """scripts/bare-system says why it cannot be run here, and by its status that it was not."""
-    with tempfile.TemporaryDirectory() as name:
-        folder = pathlib.Path(name)
-        (folder / "scripts").mkdir()
-        shutil.copy(ROOT / "scripts/bare-system", folder / "scripts")
-        write(folder / "wget", "exit 4")
-        reasons = [("exit 1", "debootstrap is not there, and cannot be installed"),
-                   ("true", "there is no http://mirror.invalid/debian/dists/trixie/Release to be had")]
-        for setup, reason in reasons:
+    """scripts/kernel and scripts/bare-system say why they cannot run here, and by their status that they did not."""
+    needs_root = "a bare system can be made by root alone"
+    for script, setup, reason in (
+            ("kernel", "[[ $1 != emulator ]]", "there is no qemu, and it cannot be installed"),
+            ("bare-system 13", "exit 1", "debootstrap is not there, and cannot be installed"),
+            ("bare-system 13", "true", "there is no http://mirror.invalid/debian/dists/trixie/Release to be had")):
+        with scripts(script.split()[0]) as folder:
+            write(folder / "wget", "exit 4")
             write(folder / "scripts/setup", setup)
-            expected = reason if os.geteuid() == 0 else "a bare system can be made by root alone"
-            run = subprocess.run([folder / "scripts/bare-system", "13"], capture_output=True, text=True,
+            expected = needs_root if script != "kernel" and os.geteuid() != 0 else reason
+            run = subprocess.run(["bash", "-c", f"scripts/{script}"], cwd=folder, capture_output=True, text=True,
                                  env={**os.environ, "PATH": f"{folder}:{os.environ['PATH']}",
                                       "DEBIAN_MIRROR": "http://mirror.invalid/debian"}, check=False)
-            if (run.returncode, run.stdout) != (77, f"skipped: {expected}\n"):
-                yield f"scripts/bare-system ends with {run.returncode}: {run.stdout}{run.stderr}"
+        if (run.returncode, run.stdout) != (77, f"skipped: {expected}\n"):
+            yield f"scripts/{script} ends with {run.returncode}: {run.stdout}{run.stderr}"
 
 
 if __name__ == "__main__":
-    sys.exit(report([*list_problems(), *setup_problems(), *run_problems(), *emulator_problems(), *skip_problems()],
+    sys.exit(report([*list_problems(), *setup_problems(), *run_problems(), *skip_problems()],
                     FIX, {PAGE: page_with_steps()}))
