@@ -1,5 +1,6 @@
 #!/usr/bin/env python3
-"""Has scripts/android look at objects that call what API level 27 lacks, and at one that does not."""
+"""Runs scripts/android on objects that call functions which API level 27 lacks, and on one that
+does not."""
 
 import pathlib
 import subprocess
@@ -8,7 +9,7 @@ import tempfile
 
 from sources import ROOT, report
 
-# What came later, as a program calls it, and the name by which the linker knows it.
+# Later functions: a call of each, and its linker name.
 LATER = {
     "int memfd_create(const char*, unsigned);": ("memfd_create", 'memfd_create("", 0)'),
     "long getrandom(void*, unsigned long, unsigned);": ("getrandom", "getrandom(0, 0, 0)"),
@@ -21,8 +22,8 @@ EARLIER = 'long read(int, void*, unsigned long); int Own(); int Call() { return 
 OWN = "int Own() { return 1; }"
 
 
-def compiled(folder, name, text):
-    source, built = folder / f"{name}.cpp", folder / f"{name}.o"
+def compiled(directory, name, text):
+    source, built = directory / f"{name}.cpp", directory / f"{name}.o"
     source.write_text('extern "C" {\n' + text + "\n}\n")
     subprocess.run(["clang++", "--target=aarch64-linux-android27", "-c", source, "-o", built], check=True)
     return built
@@ -36,8 +37,8 @@ def compare(*objects):
 def main():
     problems = []
     with tempfile.TemporaryDirectory() as name:
-        folder = pathlib.Path(name)
-        good, own = compiled(folder, "good", EARLIER), compiled(folder, "own", OWN)
+        directory = pathlib.Path(name)
+        good, own = compiled(directory, "good", EARLIER), compiled(directory, "own", OWN)
         result = compare(good, own)
         if result.returncode != 0 or "2 objects" not in result.stdout:
             problems.append(f"what the level has is refused: {result.stdout}")
@@ -45,7 +46,7 @@ def main():
         if result.returncode != 1 or f"Own called by {good}\n" not in result.stdout:
             problems.append(f"a function that is nowhere is not noticed: {result.stdout}")
         for declaration, (symbol, call) in LATER.items():
-            bad = compiled(folder, "bad", f"{declaration} int Later() {{ return {call}; }}")
+            bad = compiled(directory, "bad", f"{declaration} int Later() {{ return {call}; }}")
             result = compare(good, own, bad)
             if result.returncode != 1 or symbol not in result.stdout or "read" in result.stdout:
                 problems.append(f"{symbol} is not noticed: {result.stdout}")

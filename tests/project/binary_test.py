@@ -1,5 +1,5 @@
 #!/usr/bin/env python3
-"""Has scripts/check-binary look at programs that lack one part of the hardening each.
+"""Runs scripts/check-binary on programs that each lack one part of the hardening.
 
 Argument: the compiler.
 """
@@ -11,7 +11,7 @@ import tempfile
 
 from sources import ROOT, report
 
-# Something for each part: a buffer on the stack, and a call whose room is known.
+# A program with a use for each part: a buffer on the stack, and a call whose room is known.
 SOURCE = """#include <stdio.h>
 #include <string.h>
 int main(int count, char** words) {
@@ -25,7 +25,7 @@ int main(int count, char** words) {
 GOOD = {"bind": "-Wl,-z,now", "table": "-Wl,-z,relro", "place": "-pie -fPIE",
         "stack": "-fstack-protector-strong", "calls": "-D_FORTIFY_SOURCE=2", "heap": "-O2"}
 
-# In place of a part, and what is said of it.
+# The flag that removes a part, and the message about it.
 BAD = [("bind", "-Wl,-z,lazy", "binds its symbols when they are called"),
        ("table", "-Wl,-z,norelro", "can be written"),
        ("place", "-no-pie -fno-pie", "lies where it was linked to"),
@@ -34,11 +34,11 @@ BAD = [("bind", "-Wl,-z,lazy", "binds its symbols when they are called"),
        ("heap", "-O2 -Wl,-z,execstack", "can be executed")]
 
 
-def compiled(compiler, folder, parts, *more):
-    (folder / "source.cpp").write_text(SOURCE)
+def compiled(compiler, directory, parts, *more):
+    (directory / "source.cpp").write_text(SOURCE)
     flags = " ".join(parts.values()).split()
-    subprocess.run([compiler, *flags, *more, "source.cpp", "-o", "made"], cwd=folder, check=True)
-    return folder / "made"
+    subprocess.run([compiler, *flags, *more, "source.cpp", "-o", "made"], cwd=directory, check=True)
+    return directory / "made"
 
 
 def check(*files):
@@ -52,22 +52,22 @@ def main():
                          capture_output=True).stdout.startswith("aarch64")
     problems = []
     with tempfile.TemporaryDirectory() as name:
-        folder = pathlib.Path(name)
-        result = check(compiled(compiler, folder, GOOD))
+        directory = pathlib.Path(name)
+        result = check(compiled(compiler, directory, GOOD))
         if result.returncode != 0 or "hardened: made\n" not in result.stdout:
             problems.append(f"a hardened program is refused: {result.stdout}")
         for part, instead, message in BAD:
-            result = check(compiled(compiler, folder, {**GOOD, part: instead}))
+            result = check(compiled(compiler, directory, {**GOOD, part: instead}))
             if result.returncode != 1 or message not in result.stdout:
                 problems.append(f"{instead} is not noticed: {result.stdout}")
         if arm:
             branches = {**GOOD, "branches": "-mbranch-protection=standard"}
-            if (result := check(compiled(compiler, folder, branches, "-c"))).returncode != 0:
+            if (result := check(compiled(compiler, directory, branches, "-c"))).returncode != 0:
                 problems.append(f"a hardened object is refused: {result.stdout}")
-            result = check(compiled(compiler, folder, GOOD, "-c"))
+            result = check(compiled(compiler, directory, GOOD, "-c"))
             if result.returncode != 1 or "0 of 1 objects" not in result.stdout:
                 problems.append(f"unprotected branches are not noticed: {result.stdout}")
-        for files in ((), (folder / "missing",)):
+        for files in ((), (directory / "missing",)):
             if check(*files).returncode == 0:
                 problems.append(f"{files} are taken for hardened files")
     return report(problems, "scripts/check-binary")

@@ -11,16 +11,17 @@ from sources import ROOT, without_comments
 
 TOKEN = re.compile(r'"((?:[^"\\]|\\.)*)"|([A-Za-z_]\w*|\d+)|([{}\[\]:,=+])|(\S)')
 
-# What Android 8.1 compiles C++ as where a module does not say.
+# The language level of Android 8.1 for a module that names none.
 DEFAULT_STANDARD = "gnu++14"
 
 
 class Blueprint:
-    """The modules of a file: each a dictionary, its type under the key "type"; its variables."""
+    """The modules of a file and its variables. A module is a dictionary, with its type under
+    "type"."""
 
     def __init__(self, path):
         self.path = path
-        self.folder = path.parent.relative_to(ROOT)
+        self.directory = path.parent.relative_to(ROOT)
         self.tokens = [(m[1], m[2] or m[3] or m[4])
                        for m in TOKEN.finditer(without_comments(path.read_text()))]
         self.modules = []
@@ -31,7 +32,7 @@ class Blueprint:
                 self.word("=")
                 self.variables[name] = self.value()
             else:
-                self.modules.append({"type": name, "folder": self.folder, **self.value()})
+                self.modules.append({"type": name, "directory": self.directory, **self.value()})
 
     def word(self, expected=None):
         text, word = self.tokens.pop(0)
@@ -74,41 +75,41 @@ class Blueprint:
 
 def sources(module):
     """The module's .cpp files, relative to the root."""
-    return [str(module["folder"] / source) for source in module.get("srcs", [])
+    return [str(module["directory"] / source) for source in module.get("srcs", [])
             if source.endswith(".cpp")]
 
 
 class Tree:
-    """The modules of several files, which refer to one another by their names."""
+    """The modules of several files, which refer to one another by name."""
 
     def __init__(self, paths):
         self.modules = [module for path in paths for module in Blueprint(path).modules]
 
     def flags(self, module):
-        """What the files have the compiler told for each source of the module."""
+        """The compiler flags that the files give for each source of the module."""
         module = self.with_defaults(module)
-        folders = self.include_folders(module)
+        directories = self.include_directories(module)
         return [f"-std={module.get('cpp_std', DEFAULT_STANDARD)}", *module.get("cflags", []),
-                *(f"-I{folder}" for folder in folders)]
+                *(f"-I{directory}" for directory in directories)]
 
     def with_defaults(self, module):
-        """The module with the properties of its defaults, whose lists go before its own."""
+        """The module with the properties of its defaults. Their lists come before its own."""
         merged = {}
         for part in [*map(self.with_defaults, self.named(module.get("defaults", []))), module]:
             for key, value in part.items():
                 merged[key] = merged.get(key, []) + value if isinstance(value, list) else value
         return merged
 
-    def include_folders(self, module):
-        """Where it finds headers: in its own folders, and where its static libraries tell."""
-        own = [module["folder"] / name for key in ("local_include_dirs", "export_include_dirs")
+    def include_directories(self, module):
+        """The directories of its headers: its own, and those that its static libraries export."""
+        own = [module["directory"] / name for key in ("local_include_dirs", "export_include_dirs")
                for name in module.get(key, [])]
-        return own + [library["folder"] / name
+        return own + [library["directory"] / name
                       for library in self.named(module.get("static_libs", []))
                       for name in library.get("export_include_dirs", [])]
 
     def named(self, names):
-        """The modules of these names, as far as they are ours and not the platform's."""
+        """The modules of these names that are the project's own, not the platform's."""
         return [module for name in names for module in self.modules if module["name"] == name]
 
 

@@ -10,7 +10,7 @@ import sys
 from blueprint import Blueprint
 from sources import ROOMS, ROOT, report, tool_sources
 
-# What needs more than a phone has, and so is in the workstation's build alone.
+# Sources that need more than a phone has. Only the workstation's build has them.
 WORKSTATION_ONLY = {
     "tests/apk/manifest_mf_test.cpp": "runs the JDK",
     "tests/crypto/mpi_mod_mpi_test.cpp": "compares with GMP",
@@ -30,15 +30,15 @@ WORKSTATION_ONLY = {
     "fuzz/verdict_fuzz.cpp": "judges with the simulator",
 }
 
-# The words that the build of Android 8.1 knows. An unknown one stops the whole tree.
+# The words that the build of Android 8.1 knows. An unknown word stops the whole tree.
 KNOWN_TYPES = {"cc_binary", "cc_defaults", "cc_library_shared", "cc_library_static", "cc_test",
                "filegroup"}
 KNOWN_PROPERTIES = {"cflags", "compile_multilib", "cpp_std", "data", "defaults",
                     "export_include_dirs", "init_rc", "ldflags", "local_include_dirs", "name", "shared_libs",
                     "srcs", "static_libs"}
 
-# The first is for headers that are the system's here and the user's there. For the second, the
-# developers' presets use a variable of CMake's own.
+# The first flag is for headers that are system headers in CMake's build but not in the platform's.
+# The developers' presets set the second by a variable of CMake's own.
 PLATFORM_ONLY_FLAGS = {"-Wno-sign-conversion", "-Werror"}
 
 
@@ -119,24 +119,24 @@ def hold_wraps(tests, problems):
 def hold_words(platform, tests, problems):
     for module in platform.modules + tests.modules:
         words = {module["type"]} - KNOWN_TYPES
-        words |= set(module) - {"type", "folder"} - KNOWN_PROPERTIES
+        words |= set(module) - {"type", "directory"} - KNOWN_PROPERTIES
         problems += [f"{module['name']}: Android 8.1 does not know {word}" for word in sorted(words)]
         if module.get("cpp_std", "c++1z") != "c++1z":
             problems.append(f"{module['name']}: Android 8.1 does not know {module['cpp_std']}")
-    # It reads no other blueprints than those named, later releases read all that there are.
+    # Android 8.1 reads only the named blueprints. Later releases read all that they find.
     compare("blueprints below the first", platform.variables["subdirs"],
             [path.parent.name for path in ROOT.glob("*/Android.bp")], problems)
 
 
 def cmake_sources(target):
     """The sources of a target, DIRECTORY:NAME, or NAME in the root."""
-    folder, _, name = target.rpartition(":")
-    path = ROOT / folder / "CMakeLists.txt"
+    directory, _, name = target.rpartition(":")
+    path = ROOT / directory / "CMakeLists.txt"
     found = re.search(rf"(?:add_library|add_executable|apktoolkit_add_test)\({name}\s+([^)]*)\)",
                       without_comments_of_cmake(path))
     if not found:
         sys.exit(f"{path} has no target {name}")
-    return sorted(str(pathlib.Path(folder, word)) for word in found[1].split() if word.endswith(".cpp"))
+    return sorted(str(pathlib.Path(directory, word)) for word in found[1].split() if word.endswith(".cpp"))
 
 
 def without_comments_of_cmake(path):

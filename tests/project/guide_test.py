@@ -15,32 +15,32 @@ import zipfile
 from sources import ROOT, Shell, report, shown_commands
 
 PAGE = ROOT / "docs/guide.md"
-FOLDER = "/data/app/vault"  # what the page has in place of this test's folder
+DIRECTORY = "/data/app/vault"  # replaces the path of this test's directory on the page
 BLOCK = re.compile(r"^```\n(\$ .*?)\n```$", re.M | re.S)
 
-# What is another with each certificate that is made, and with each compiler of the library: on the
-# page, any will do.
+# Texts that differ with each new certificate, and with each compiler of the library. Any value is
+# right on the page.
 VARIES = [(re.compile(r"certificate SHA-256 digest: [0-9a-f]{64}"), "certificate SHA-256 digest: *"),
           (re.compile(r"\(\d+ bytes\) verified"), "(* bytes) verified"),
           (re.compile(r"(signer CN=Example, RSA-2048, key ).*"), r"\1*")]
 
 
-def prepare(golden, folder):
-    """The files that the page speaks of."""
+def prepare(golden, directory):
+    """Makes the files that the page names."""
     package = golden / "apksigner-sha256-2048"
-    shutil.copy(package / "base.apk", folder)
-    shutil.copytree(package, folder / "tampered")
-    library = folder / "tampered/lib/arm64/libvault.so"
+    shutil.copy(package / "base.apk", directory)
+    shutil.copytree(package, directory / "tampered")
+    library = directory / "tampered/lib/arm64/libvault.so"
     library.write_bytes(library.read_bytes()[:-1])
     for name, source in (("newer-only", "apksigner-newer-only"), ("changed-dex", "changed-dex"),
                          ("added-entry", "added-entry")):
-        shutil.copytree(golden / source, folder / name)
-    (folder / "alone").mkdir()
-    shutil.copy(package / "base.apk", folder / "alone")
-    shutil.copy(golden / "unsigned.apk", folder)
-    shutil.copy(golden / "rsa-2048.pem", folder / "signer.pem")
-    (folder / "notes.txt").write_text("nothing")
-    with zipfile.ZipFile(folder / "library.jar", "w") as archive:
+        shutil.copytree(golden / source, directory / name)
+    (directory / "alone").mkdir()
+    shutil.copy(package / "base.apk", directory / "alone")
+    shutil.copy(golden / "unsigned.apk", directory)
+    shutil.copy(golden / "rsa-2048.pem", directory / "signer.pem")
+    (directory / "notes.txt").write_text("nothing")
+    with zipfile.ZipFile(directory / "library.jar", "w") as archive:
         archive.writestr("a.txt", "a")
 
 
@@ -55,7 +55,7 @@ def checked(block, shell):
     """The block as it should be."""
     lines = []
     for command, expected in shown_commands(block):
-        shown = shell.run(command).stdout.replace(str(shell.folder), FOLDER).splitlines()
+        shown = shell.run(command).stdout.replace(str(shell.directory), DIRECTORY).splitlines()
         if expected and expected[-1].strip() == "...":
             shown = shown[:len(expected) - 1] + expected[-1:]
         lines += [f"$ {command}", *(expected if settled(shown) == settled(expected) else shown)]
@@ -67,9 +67,9 @@ def main():
     page = PAGE.read_text()
     problems = [] if BLOCK.search(page) else ["docs/guide.md shows no command"]
     with tempfile.TemporaryDirectory() as name:
-        folder = pathlib.Path(name).resolve()
-        prepare(pathlib.Path(golden), folder)
-        shell = Shell(folder, simulator)
+        directory = pathlib.Path(name).resolve()
+        prepare(pathlib.Path(golden), directory)
+        shell = Shell(directory, simulator)
         for block in BLOCK.findall(page):
             page = page.replace(block, checked(block, shell), 1)
     return report(problems, PAGE, {PAGE: page})

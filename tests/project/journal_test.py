@@ -1,8 +1,8 @@
 #!/usr/bin/env python3
-"""Holds journals of real runs against docs/journal.schema.json.
+"""Checks journals of real runs with docs/journal.schema.json.
 
-Arguments: the folder of a good package that asks for its key to be registered, and the words that
-start apktoolkit-sim.
+Arguments: the directory of a good package that asks for its key to be registered, and the words
+that start apktoolkit-sim.
 """
 
 import json
@@ -20,24 +20,24 @@ from sources import ROOT, changed_zip, report
 SCHEMA = json.loads((ROOT / "docs/journal.schema.json").read_text())
 
 
-def runs(package, folder):
+def runs(package, directory):
     """Command lines of the simulator that between them provoke every event and every verdict."""
-    folder = pathlib.Path(folder)
-    jar = folder / "library.jar"
+    directory = pathlib.Path(directory)
+    jar = directory / "library.jar"
     with zipfile.ZipFile(jar, "w") as archive:
         archive.writestr("a.txt", "a")
-    damaged = folder / "damaged.apk"
+    damaged = directory / "damaged.apk"
     changed_zip(package, lambda name, content: b"no signature block" if name.endswith(".RSA") else content, damaged)
-    odd_name = folder / b"\xe9t\xc3\xa9.txt".decode(errors="surrogateescape")
+    odd_name = directory / b"\xe9t\xc3\xa9.txt".decode(errors="surrogateescape")
     odd_name.write_text("no archive")
     yield [package]
     yield ["--strict", "--jobs", "2", *sorted(package.parent.parent.glob("*/base.apk")), package]
     yield ["--sign-errno", "EPERM", "--zu-result", "7", package]
     yield ["--integrity", "missing", package]
     yield ["--integrity", "ffffffff", "--timeout", "1", package]
-    yield [jar, folder / "absent.apk"]
+    yield [jar, directory / "absent.apk"]
     yield ["--trust", jar, jar]
-    alone = folder / "alone.apk"
+    alone = directory / "alone.apk"
     shutil.copy(package, alone)
     yield ["--strict", alone]
     yield [damaged]
@@ -48,8 +48,8 @@ def main():
     package = pathlib.Path(sys.argv[1]) / "base.apk"
     validator = jsonschema.Draft202012Validator(SCHEMA)
     problems, seen, verdicts = [], {}, set()
-    with tempfile.TemporaryDirectory() as folder:
-        for run in runs(package, folder):
+    with tempfile.TemporaryDirectory() as directory:
+        for run in runs(package, directory):
             journal = subprocess.run([*sys.argv[2:], "--json", *run], capture_output=True).stdout
             for line in journal.splitlines():
                 event = json.loads(line)
@@ -62,7 +62,7 @@ def main():
     problems += [f"no run had the event {kind}" for kind in kinds - {kind for kind, _ in seen}]
     known = set(SCHEMA["$defs"]["verdict"]["properties"]["verdict"]["enum"])
     problems += [f"no run had the verdict {verdict}" for verdict in known - verdicts]
-    # The schema must be able to say no: to an event without any one of its members.
+    # The schema must also refuse: it refuses every event that lacks one of its members.
     for event in seen.values():
         for member in event:
             poorer = {key: value for key, value in event.items() if key != member}

@@ -1,8 +1,7 @@
 #!/usr/bin/env python3
-"""Runs every command that makes a key on README.md, in docs/guide.md and on the manual page: its
-certificate is signed with SHA-256. What the pages say of the JDKs' own choice is held against the JDK
-that is installed, as far as it is one of those.
-"""
+"""Runs every command that makes a key in README.md, in docs/guide.md and on the manual page. Each
+certificate must be signed with SHA-256. The pages also tell what the JDKs choose by themselves.
+That is compared with the installed JDK, if it is one of those."""
 
 import re
 import subprocess
@@ -18,18 +17,18 @@ OWN_CHOICE = {17: {"3072": "sha256WithRSAEncryption", "3073": "sha384WithRSAEncr
 
 
 def shown_commands(page):
-    """The page's commands, each on one line; in a manual page, a backslash is written as \\e."""
+    """The page's commands, each on one line. A manual page writes a backslash as \\e."""
     text = (ROOT / page).read_text().replace("\\e\n", "\\\n")
     return [re.sub(r"\\\n\s*", "", command) for command in COMMAND.findall(text)]
 
 
 def signature_algorithm(command):
-    """That of the certificate which the command makes, as openssl tells it."""
-    with tempfile.TemporaryDirectory() as folder:
+    """The signature algorithm of the certificate that the command makes, as openssl prints it."""
+    with tempfile.TemporaryDirectory() as directory:
         run = subprocess.run(["bash", "-c", f"{command} -dname CN=Example -storepass android && "
                               "openssl pkcs12 -in release.p12 -passin pass:android -nokeys |"
                               "openssl x509 -noout -text"],
-                             cwd=folder, capture_output=True, text=True, check=False)
+                             cwd=directory, capture_output=True, text=True, check=False)
     found = re.search(r"Signature Algorithm: (\w+)", run.stdout)
     return found[1] if found else run.stdout + run.stderr
 
@@ -41,7 +40,7 @@ def page_problems():
         if not commands:
             problems.append(f"{page} shows no command that makes a key")
         for command in commands:
-            # These two are asked for when they are not given, and given once only.
+            # keytool asks for these two unless they are given. Each may be given only once.
             command = re.sub(r" -(dname|storepass) \S+| 2>.*", "", command)
             if (found := signature_algorithm(command)) != "sha256WithRSAEncryption":
                 problems.append(f"{page}: the certificate of {command} is signed with {found}")

@@ -1,8 +1,8 @@
 #!/usr/bin/env python3
-"""Installs the library into a folder of its own, builds and runs the example against it as
+"""Installs the library into its own directory, builds and runs the example with it as
 examples/README.md shows, and compiles each installed header alone.
 
-Arguments: the build tree, the compiler, and the folder of a good package.
+Arguments: the build tree, the compiler, and the directory of a good package.
 """
 
 import os
@@ -18,21 +18,21 @@ from sources import ROOT, changed_zip, report, shown_commands
 MARK = "== next command"
 
 
-def prepare(folder, build, package):
-    """The page's folder: what a checkout has, the build tree, and the files that the page names."""
-    shutil.copytree(ROOT / "examples", folder / "examples")
-    (folder / "build").mkdir()
-    (folder / "build/release").symlink_to(build)
-    shutil.copy(package / "base.apk", folder)
+def prepare(directory, build, package):
+    """The page's directory: what a checkout has, the build tree, and the files that the page names."""
+    shutil.copytree(ROOT / "examples", directory / "examples")
+    (directory / "build").mkdir()
+    (directory / "build/release").symlink_to(build)
+    shutil.copy(package / "base.apk", directory)
     changed_zip(package / "base.apk", lambda name, content: content + (b"X: y\r\n" if name.endswith(".MF") else b""),
-                folder / "changed.apk")
+                directory / "changed.apk")
 
 
-def run(commands, folder, compiler):
-    """What each command prints, all of them being lines of one shell, up to the first that fails."""
+def run(commands, directory, compiler):
+    """The output of each command. All run in one shell, until one fails."""
     script = "set -euo pipefail\n" + "\n".join(f"echo '{MARK}'; {command}" for command in commands)
-    environment = {**os.environ, "HOME": str(folder), "CXX": compiler}
-    result = subprocess.run(["bash", "-c", script], cwd=folder, env=environment, text=True,
+    environment = {**os.environ, "HOME": str(directory), "CXX": compiler}
+    result = subprocess.run(["bash", "-c", script], cwd=directory, env=environment, text=True,
                             capture_output=True)
     printed = [text.splitlines()[1:] for text in result.stdout.split(MARK)[1:]]
     if result.returncode == 0:
@@ -40,25 +40,25 @@ def run(commands, folder, compiler):
     return printed, [f"{commands[len(printed) - 1]} fails:", *printed[-1], result.stderr]
 
 
-def page_problems(folder, compiler):
+def page_problems(directory, compiler):
     # The build tree that is tested is the one that the first command would make.
     blocks = re.findall(r"^```\n(\$ .*?)\n```$", (ROOT / "examples/README.md").read_text(), re.M | re.S)
     shown = [command for block in blocks for command in shown_commands(block)][1:]
-    printed, problems = run([command for command, _ in shown], folder, compiler)
+    printed, problems = run([command for command, _ in shown], directory, compiler)
     for (command, expected), lines in zip(shown, printed):
         if expected != ["..."] and lines != expected:
             problems += [f"{command} prints:", *lines]
     return problems
 
 
-def header_problems(folder, compiler):
-    include = folder / "apktoolkit/include/apktoolkit"
-    flags = subprocess.run(["pkg-config", "--cflags", folder / "apktoolkit/lib/pkgconfig/apktoolkit.pc"], check=True,
+def header_problems(directory, compiler):
+    include = directory / "apktoolkit/include/apktoolkit"
+    flags = subprocess.run(["pkg-config", "--cflags", directory / "apktoolkit/lib/pkgconfig/apktoolkit.pc"], check=True,
                            capture_output=True, text=True).stdout.split()
 
     sources = []
     for header in include.rglob("*.h"):
-        sources.append(folder / f"alone{len(sources)}.cpp")
+        sources.append(directory / f"alone{len(sources)}.cpp")
         sources[-1].write_text(f'#include "{header.relative_to(include)}"\n')
     result = subprocess.run([compiler, "-std=c++17", "-Wall", "-Wextra", "-Werror", *flags, "-fsyntax-only", *sources],
                             capture_output=True, text=True)
@@ -74,10 +74,10 @@ def main():
     if digest not in (ROOT / "examples/README.md").read_text():
         problems.append(f"examples/README.md does not show the signer's digest, {digest}")
     with tempfile.TemporaryDirectory() as name:
-        folder = pathlib.Path(name).resolve()
-        prepare(folder, pathlib.Path(build), pathlib.Path(package))
-        problems += page_problems(folder, compiler)
-        problems += header_problems(folder, compiler)
+        directory = pathlib.Path(name).resolve()
+        prepare(directory, pathlib.Path(build), pathlib.Path(package))
+        problems += page_problems(directory, compiler)
+        problems += header_problems(directory, compiler)
     return report(problems, "examples/README.md, or cmake/Library.cmake, which installs the library")
 
 

@@ -1,8 +1,8 @@
 #!/usr/bin/env python3
-"""Holds the manual pages against mandoc, the simulator's page and completion against --help, and runs
-the page's examples.
+"""Checks the manual pages with mandoc, compares the simulator's page and completion with --help,
+and runs the page's examples.
 
-Arguments: the folder of a good package, and the words that start apktoolkit-sim.
+Arguments: the directory of a good package, and the words that start apktoolkit-sim.
 """
 
 import pathlib
@@ -17,7 +17,7 @@ from sources import ROOT, Shell, report
 
 
 def lint(page):
-    """What mandoc has to say, except that the project's other page is not installed."""
+    """mandoc's complaints, except that the project's other page is not installed."""
     output = subprocess.run(["mandoc", "-T", "lint", page], capture_output=True, text=True)
     return [line for line in output.stdout.splitlines()
             if "referenced manual not found: Xr apktoolkit" not in line]
@@ -28,21 +28,21 @@ def options(text):
 
 
 def examples(page):
-    """The commands of the page's examples, as one types them."""
+    """The commands of the page's examples, as a user types them."""
     section = page.split(".Sh EXAMPLES\n")[1].split("\n.Sh ")[0]
     for single, block in re.findall(r"^\.Dl \$ (.*)$|^\.Bd -literal.*\n\$ ((?:.*\n)*?)\.Ed$", section, re.M):
         yield (single or block).replace("\\e", "\\")
 
 
 def run_examples(page, package, simulator):
-    """The examples that print nothing, complain, or end with another status than 0 or 1."""
+    """The examples that print nothing, print an error, or end with a status other than 0 and 1."""
     problems = []
     with tempfile.TemporaryDirectory() as name:
-        folder = pathlib.Path(name)
-        shutil.copytree(package, folder, dirs_exist_ok=True)
-        with zipfile.ZipFile(folder / "library.jar", "w") as archive:
+        directory = pathlib.Path(name)
+        shutil.copytree(package, directory, dirs_exist_ok=True)
+        with zipfile.ZipFile(directory / "library.jar", "w") as archive:
             archive.writestr("a.txt", "a")
-        shell, count = Shell(folder, simulator), 0
+        shell, count = Shell(directory, simulator), 0
         for example in examples(page):
             shell.status = 0
             run = shell.run(example, subprocess.PIPE)

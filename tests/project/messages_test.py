@@ -55,13 +55,13 @@ CAUSE = re.compile(r"inline constexpr Cause (?P<name>k\w+) = \{\s*(?P<code>%s),\
                    r"\s*Severity::(?P<severity>k\w+),\s*ChainLink::(?P<link>k\w+),\s*(?P<log>%s),"
                    r"\s*(?P<reason>%s),\s*(?P<cure>%s)\};" % ((LITERALS,) * 4))
 
-# The groups in their order, with what stands above their tables.
+# The groups in order, each with the title of its table.
 GROUPS = {"kNotLookedAt": "The tool did not look at the file",
           "kSimulation": "The simulation could not tell", "kFile": "What the file is",
           "kSignature": "A package's signature", "kKernel": "The kernel", "kLibrary": "A library",
           "kKey": "The key", "kTool": "The tool itself", "kWarning": "Warnings"}
 
-# Causes that leave the chain from the key to the entries whole: all others have to break it.
+# Groups of causes that leave the chain from the key to the entries whole. All others must break it.
 UNBROKEN = {"kKernel", "kKey", "kWarning"}
 
 PAGE = ROOT / "docs/messages.md"
@@ -80,7 +80,7 @@ def causes():
 
 
 def tables(rows):
-    """The tables of reasons as the page has them."""
+    """The tables of reasons as they should be on the page."""
     parts = []
     for group, title in GROUPS.items():
         lines = [f"| `{row['code']}` | {row['reason']} | {row['cure']} | {row['log']} |"
@@ -91,7 +91,7 @@ def tables(rows):
 
 
 def codes(rows):
-    """The list of codes as the schema has it."""
+    """The list of codes as it should be in the schema."""
     text = ", ".join(f'"{row["code"]}"' for row in rows)
     return "[\n" + textwrap.fill(text, 100, initial_indent=" " * 8, subsequent_indent=" " * 8,
                                  break_on_hyphens=False) + "\n      ]"
@@ -117,7 +117,7 @@ def reasons_problems(rows, messages):
     return problems
 
 
-# A row of the texts that the simulator understands: meaning, text, what is captured.
+# A row of the texts that the simulator understands: meaning, text, captured part.
 LOG_LINES = ROOT / "simulator/run/log_lines.cpp"
 LOG_TEXT = re.compile(r"\{LogMeaning::k\w+,\s*(%s),\s*(\d+|kNothing)\}" % LITERALS)
 

@@ -1,8 +1,9 @@
 #!/usr/bin/env python3
-"""Runs scripts/demo, and holds what README.md shows of it against what it prints.
+"""Runs scripts/demo, and compares README.md's excerpt with its output.
 
-Arguments: the command of the built apktoolkit-sim. A line of three dots on the page stands for lines
-that are left out. Which byte is changed, and what it is, differs with the compiler of the library.
+Arguments: the command of the built apktoolkit-sim. A line of three dots on the page stands for
+lines that are left out. The number of the changed byte and its value depend on the library's
+compiler.
 """
 
 import os
@@ -21,7 +22,7 @@ def settled(text):
 
 
 def pattern(shown):
-    """What is shown, as an expression that the whole output matches."""
+    """A regular expression for the page's excerpt that the whole output matches."""
     parts = (re.escape(line + "\n") if line != "..." else r"(?:.*\n)*?" for line in shown)
     return "".join(parts)
 

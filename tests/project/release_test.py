@@ -25,30 +25,30 @@ def version_problems(version):
 
 
 class Repository:
-    def __init__(self, folder):
-        self.folder = folder
-        self.environment = {**os.environ, "GNUPGHOME": str(folder / "gpg"), "HOME": str(folder),
+    def __init__(self, directory):
+        self.directory = directory
+        self.environment = {**os.environ, "GNUPGHOME": str(directory / "gpg"), "HOME": str(directory),
                             "GIT_AUTHOR_NAME": "A", "GIT_AUTHOR_EMAIL": "a@example.com",
                             "GIT_COMMITTER_NAME": "A", "GIT_COMMITTER_EMAIL": "a@example.com"}
-        (folder / "gpg").mkdir(mode=0o700)
-        (folder / "scripts").mkdir()
-        shutil.copy(ROOT / "scripts/release", folder / "scripts")
+        (directory / "gpg").mkdir(mode=0o700)
+        (directory / "scripts").mkdir()
+        shutil.copy(ROOT / "scripts/release", directory / "scripts")
         for name, content in (("setup", "true"), ("reproducible", BUILDER)):
-            script = folder / "scripts" / name
+            script = directory / "scripts" / name
             script.write_text(f"#!/bin/bash\n{content}\n")
             script.chmod(0o755)
-        (folder / ".gitignore").write_text("/build/\n/gpg/\n/.gitconfig\n")
-        (folder / ".gitconfig").write_text("[tar]\n\tumask = user\n")  # the user's own wish
+        (directory / ".gitignore").write_text("/build/\n/gpg/\n/.gitconfig\n")
+        (directory / ".gitconfig").write_text("[tar]\n\tumask = user\n")  # the user's own wish
         self.run("gpg", "--batch", "--quiet", "--passphrase", "", "--quick-generate-key",
                  "A <a@example.com>", "ed25519", "sign")
         self.run("git", "init", "--quiet")
 
     def run(self, *command):
-        return subprocess.run(command, cwd=self.folder, env=self.environment, text=True, check=True,
+        return subprocess.run(command, cwd=self.directory, env=self.environment, text=True, check=True,
                               stdout=subprocess.PIPE, stderr=subprocess.STDOUT).stdout
 
     def commit(self, changes):
-        (self.folder / "CHANGES.md").write_text(changes)
+        (self.directory / "CHANGES.md").write_text(changes)
         self.run("git", "add", ".")
         self.run("git", "commit", "--quiet", "--message", "x")
 
@@ -56,7 +56,7 @@ class Repository:
         self.run("git", "tag", "--message", "x", *options, name)
 
     def release(self, name):
-        run = subprocess.run(["scripts/release", name], cwd=self.folder, env=self.environment,
+        run = subprocess.run(["scripts/release", name], cwd=self.directory, env=self.environment,
                              text=True, capture_output=True, check=False)
         return run.returncode, run.stdout + run.stderr
 
@@ -76,15 +76,15 @@ def refusal_problems(repository):
         status, printed = repository.release(tag)
         if status != 1 or f"release: {reason}\n" not in printed:
             yield f"scripts/release {tag} ends with {status}: {printed}"
-        if (repository.folder / "build/releases" / tag[1:] / "SHA256SUMS").exists():
+        if (repository.directory / "build/releases" / tag[1:] / "SHA256SUMS").exists():
             yield f"scripts/release {tag} left files"
 
 
 def release_problems(repository):
     repository.commit(RELEASED)
     repository.tag("v1.2.3", "--sign", "--force")
-    (repository.folder / "CHANGES.md").write_text("not committed")
-    out = repository.folder / "build/releases/1.2.3"
+    (repository.directory / "CHANGES.md").write_text("not committed")
+    out = repository.directory / "build/releases/1.2.3"
     sums = []
     for umask in (0o022, 0o077):
         old = os.umask(umask)

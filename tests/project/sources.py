@@ -38,16 +38,16 @@ class Shell:
     """A shell in the directory, in which these words start apktoolkit-sim. A command finds the files and the
     status that the one before it left."""
 
-    def __init__(self, folder, simulator):
-        self.folder, self.status = folder, 0
-        (folder / "bin").mkdir()
-        command = folder / "bin/apktoolkit-sim"
+    def __init__(self, directory, simulator):
+        self.directory, self.status = directory, 0
+        (directory / "bin").mkdir()
+        command = directory / "bin/apktoolkit-sim"
         command.write_text(f"#!/bin/sh\nexec {shlex.join(simulator)} \"$@\"\n")
         command.chmod(0o755)
-        self.environment = {**os.environ, "PATH": f"{folder}/bin:{os.environ['PATH']}", "LC_ALL": "C.UTF-8"}
+        self.environment = {**os.environ, "PATH": f"{directory}/bin:{os.environ['PATH']}", "LC_ALL": "C.UTF-8"}
 
     def run(self, command, stderr=subprocess.STDOUT):
-        run = subprocess.run(["bash", "-c", f"(exit {self.status})\n{command}"], cwd=self.folder, text=True,
+        run = subprocess.run(["bash", "-c", f"(exit {self.status})\n{command}"], cwd=self.directory, text=True,
                              env=self.environment, stdout=subprocess.PIPE, stderr=stderr)
         self.status = run.returncode
         return run

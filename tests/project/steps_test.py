@@ -38,7 +38,7 @@ def page_with_steps():
 
 
 def part(path, beginning, end):
-    """The text of the file between the two, patterns for whole lines."""
+    """The text of the file between two lines, given as patterns."""
     return re.search(rf"^{beginning}\n(.*?)^{end}$", (ROOT / path).read_text(), re.M | re.S)[1]
 
 
@@ -49,7 +49,7 @@ def known_to_setup():
 
 
 def setup_problems():
-    """Whatever is asked of scripts/setup is known to it."""
+    """scripts/setup knows every step that it is called with."""
     asked = {("scripts/check", step) for step in listed_steps()}
     for path in (ROOT / "scripts").iterdir():
         asked |= {(path.name, word) for words in re.findall(r"^ *scripts/setup ([\w ]+)$",
@@ -68,18 +68,18 @@ def list_problems():
                                           ("README.md", shown, everyday_steps())) if found != expected]
 
 
-def check(folder, *steps):
-    run = subprocess.run([folder / "scripts/check", *steps], capture_output=True, text=True)
+def check(directory, *steps):
+    run = subprocess.run([directory / "scripts/check", *steps], capture_output=True, text=True)
     return re.sub(r"\(\d+ s, ", "(N s, ", run.stdout).splitlines(), run.returncode
 
 
 @contextlib.contextmanager
 def scripts(name):
     """A directory with a copy of this script alone."""
-    with tempfile.TemporaryDirectory() as folder:
-        (pathlib.Path(folder) / "scripts").mkdir()
-        shutil.copy(ROOT / "scripts" / name, pathlib.Path(folder) / "scripts")
-        yield pathlib.Path(folder)
+    with tempfile.TemporaryDirectory() as directory:
+        (pathlib.Path(directory) / "scripts").mkdir()
+        shutil.copy(ROOT / "scripts" / name, pathlib.Path(directory) / "scripts")
+        yield pathlib.Path(directory)
 
 
 def write(path, content):
@@ -89,16 +89,16 @@ def write(path, content):
 
 def run_problems():
     """What scripts/check makes of steps that end in every way."""
-    with scripts("check") as folder:
-        write(folder / "scripts/setup", "true")
-        write(folder / "scripts/check-arrows", "echo arrow; echo all 3 are allowed")
-        write(folder / "scripts/format", "echo bad.cpp; exit 1")
-        write(folder / "scripts/run-tests", """echo "test $1 passed"
+    with scripts("check") as directory:
+        write(directory / "scripts/setup", "true")
+        write(directory / "scripts/check-arrows", "echo arrow; echo all 3 are allowed")
+        write(directory / "scripts/format", "echo bad.cpp; exit 1")
+        write(directory / "scripts/run-tests", """echo "test $1 passed"
             echo "skipped A.B: no kernel"
             [[ $1 == release ]] || echo "FAILED A.C: one"
             echo "1 passed"
             [[ $1 == release ]]""")
-        write(folder / "scripts/bare-system", "echo on its way; echo skipped: no root; exit 77")
+        write(directory / "scripts/bare-system", "echo on its way; echo skipped: no root; exit 77")
         arrows = "arrows        all 3 are allowed (N s, build/logs/arrows.log)"
         skipped = "debian13      skipped: no root (N s, build/logs/debian13.log)"
         for steps, printed, status in (
@@ -111,10 +111,10 @@ def run_problems():
                 ("arrow", [], 2),
                 ("debian13 arrows", [skipped, arrows, "steps: 1 passed, 0 failed, 1 skipped"], 0),
                 ("debian13", [skipped, "steps: 0 passed, 0 failed, 1 skipped"], 1)):
-            if (found := check(folder, *steps.split())) != (printed, status):
+            if (found := check(directory, *steps.split())) != (printed, status):
                 yield f"scripts/check {steps} ends with {found}"
-        write(folder / "scripts/setup", "exit 1")
-        if (found := check(folder, "arrows"))[1] == 0:
+        write(directory / "scripts/setup", "exit 1")
+        if (found := check(directory, "arrows"))[1] == 0:
             yield f"scripts/check goes on without its packages: {found}"
 
 
@@ -125,12 +125,12 @@ def skip_problems():
             ("kernel", "[[ $1 != emulator ]]", "there is no qemu, and it cannot be installed"),
             ("bare-system 13", "exit 1", "debootstrap is not there, and cannot be installed"),
             ("bare-system 13", "true", "there is no http://mirror.invalid/debian/dists/trixie/Release to be had")):
-        with scripts(script.split()[0]) as folder:
-            write(folder / "wget", "exit 4")
-            write(folder / "scripts/setup", setup)
+        with scripts(script.split()[0]) as directory:
+            write(directory / "wget", "exit 4")
+            write(directory / "scripts/setup", setup)
             expected = needs_root if script != "kernel" and os.geteuid() != 0 else reason
-            run = subprocess.run(["bash", "-c", f"scripts/{script}"], cwd=folder, capture_output=True, text=True,
-                                 env={**os.environ, "PATH": f"{folder}:{os.environ['PATH']}",
+            run = subprocess.run(["bash", "-c", f"scripts/{script}"], cwd=directory, capture_output=True, text=True,
+                                 env={**os.environ, "PATH": f"{directory}:{os.environ['PATH']}",
                                       "DEBIAN_MIRROR": "http://mirror.invalid/debian"}, check=False)
         if (run.returncode, run.stdout) != (77, f"skipped: {expected}\n"):
             yield f"scripts/{script} ends with {run.returncode}: {run.stdout}{run.stderr}"

@@ -1,6 +1,6 @@
 #!/usr/bin/env python3
-"""Holds scripts/test-results against files as ctest writes them: what passed, what was skipped, what
-failed, and what could not be started."""
+"""Runs scripts/test-results on files as ctest writes them: with passed, skipped and failed tests,
+and with a test that could not be started."""
 
 import subprocess
 import sys
@@ -30,7 +30,7 @@ TIMEOUT = ('<testcase name="A.Slow" status="fail"><failure message="Timeout"/><s
 NOT_BUILT = ('<testcase name="A.Absent" status="notrun">'
              '<skipped message="Unable to find executable"/></testcase>')
 
-CASES = [  # what ctest wrote, what is to be printed, the exit status
+CASES = [  # the output of ctest, the expected lines, the exit status
     ([PASSED, PASSED], ["2 passed, 0 failed, 0 skipped"], 0),
     ([PASSED, SKIPPED], ["skipped A.Skipped: no such kernel", "1 passed, 0 failed, 1 skipped"], 0),
     ([PASSED, DISABLED], ["skipped A.Disabled: disabled", "1 passed, 0 failed, 1 skipped"], 0),

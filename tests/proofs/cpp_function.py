@@ -32,8 +32,8 @@ ROOT = pathlib.Path(__file__).resolve().parents[2]
 
 
 class Word:
-    """An unsigned number, with the operators of C++. What a product and a quotient are, a proof has
-    to say."""
+    """An unsigned number, with the operators of C++. A proof must define its products and
+    quotients."""
 
     product = quotient = None
 
@@ -88,7 +88,7 @@ class Word:
 
 
 class Answer(Word):
-    """What a comparison gives: a number, 0 or 1, and, where the run depends on it, a decision."""
+    """The result of a comparison: a number, 0 or 1, and a decision if the run depends on it."""
 
     runs = None
 
@@ -101,8 +101,8 @@ class Answer(Word):
 
 
 class Runs:
-    """All the runs of `function` that are possible where `assumptions` hold. Iterating gives, for
-    each, what holds on it and what it returns."""
+    """All possible runs of `function` under `assumptions`. Iterating gives, for each run, its
+    conditions and its result."""
 
     def __init__(self, function, assumptions, most=20):
         self.function, self.assumptions, self.most = function, assumptions, most
@@ -138,7 +138,7 @@ class Runs:
 
 
 class Pointer:
-    """Points at values: one, or a few."""
+    """Points at one value, or at a few."""
 
     def __init__(self, *values):
         self.values = list(values)
@@ -176,7 +176,7 @@ def load(path, name, **constants):
         try:
             scope[constant] = eval(expression(value), scope)
         except (NameError, SyntaxError):
-            pass  # not made of numbers alone
+            pass  # its values are not only numbers
     found = re.search(r"^(?!\s)[^\n;{}]*?\b%s\(([^;{}]*)\) \{\n(.*?)^\}" % name, text, re.S | re.M)
     if not found:
         raise AssertionError(f"{path} has no function {name}: tell tests/proofs/prove.py its new name or file")

@@ -1,8 +1,8 @@
-// The constant of the Montgomery products for every odd limb: a few seconds.
+// Checks the constant of the Montgomery products for every odd limb. Takes a few seconds.
 #include <cstdint>
 #include <cstdio>
 
-// For a function that no header declares.
+// No header declares the function, so its file is included.
 #include "crypto/mpi_pow_mod.cpp"
 
 int main() {

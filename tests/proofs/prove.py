@@ -1,6 +1,6 @@
 #!/usr/bin/python3
-"""Proves, for all inputs, what the comments of the tool's arithmetic say of it (z3); the functions
-are read from the sources. Fails when one of them does something else."""
+"""Proves, for all inputs, the claims in the comments of the tool's arithmetic (z3). Reads the
+functions from the sources. Fails if a claim does not hold."""
 import re
 import sys
 import tempfile
@@ -18,7 +18,7 @@ def word(name, bits=LIMB_BITS):
 
 
 def wide(value):
-    """With room for sums of products of two limbs."""
+    """The number with room for sums of products of two limbs."""
     term = value.term if isinstance(value, Word) else value
     return z3.ZeroExt(72 - term.size(), term)
 
@@ -43,7 +43,7 @@ def multiply_add_equals_the_wide_product_plus_both_addends():
     halves = {(x, n): (y >> (16 * n)) & HALF for x, y in (("s", s), ("b", b)) for n in (0, 1)}
     products = {}
 
-    # The product of a half of s and a half of b: an unknown number as great as one may be.
+    # The product of a half of s and a half of b: any number up to the greatest product.
     def product(left, right):
         m = next(n for n in (0, 1) if is_same(left, halves["s", n]))
         n = next(n for n in (0, 1) if is_same(right, halves["b", n]))
@@ -64,7 +64,7 @@ def half_digit_is_quotient_and_remainder():
     given = [z3.UGE(d.term, 1 << 31), z3.ULT(rest.term, d.term), z3.ULE(half.term, HALF)]
     high, low = d >> 16, d & HALF
     # rest = estimate * high + left; `taken` and `to_take` are the products of the estimate with the
-    # halves of d. No rest comes to 2^16 + 2 times `high`, so the estimate is less than that, and
+    # halves of d. `rest` is below (2^16 + 2) * high, so the estimate is below 2^16 + 2, and
     # the second product fits in a limb.
     estimate, left, taken, to_take = word("estimate"), word("left"), word("taken"), word("to_take")
     always(given, z3.UGT(wide(high) * (HALF + 3), wide(rest)))
@@ -86,14 +86,14 @@ def half_digit_is_quotient_and_remainder():
         return function(place, half, d), place[0]
 
     Word.quotient, Word.product = quotient, product
-    # The dividend is rest * 2^16 + next; less estimate * d, it is left * 2^16 + next - to_take.
+    # The dividend is rest * 2^16 + next. Less estimate * d, it is left * 2^16 + next - to_take.
     difference = (wide(left) << 16) + wide(half) - wide(to_take)
     for holds, (digit, remainder) in Runs(run, given):
         less = wide(estimate) - wide(digit)
         given_back = z3.If(less == 0, 0, z3.If(less == 1, wide(d), 2 * wide(d)))
         always(holds, z3.ULE(less, 2), z3.ULT(remainder.term, d.term),
                wide(remainder) == difference + given_back)
-    # And so the digit is the quotient, which is one half limb.
+    # Therefore the digit is the quotient, and it fits in half a limb.
     always(given, z3.ULT((wide(rest) << 16) + wide(half), wide(d) << 16))
 
 
@@ -113,7 +113,7 @@ class Power:
 
 
 class Table:
-    """The powers that were made for a window of w bits."""
+    """The powers that were computed for a window of w bits."""
 
     def __init__(self, w):
         self.w = w
@@ -124,7 +124,7 @@ class Table:
 
 
 class Number:
-    """With the limbs that the value needs and no more."""
+    """A number with exactly the limbs that its value needs."""
 
     def __init__(self, value):
         self.value = value
@@ -138,9 +138,9 @@ class Montgomery:
 
 
 def windows_make_up_the_exponent():
-    """After every window, and after every zero between them, the scan is where it began. So the
-    exponents that hold each window of up to 6 bits, with everything that may follow it up to the
-    next, stand for all; some lie across the limbs."""
+    """After every window, and after every zero between windows, the scan is in its first state
+    again. The exponents checked here hold each window of up to 6 bits, with every possible gap
+    to the next, and therefore stand for all. Some windows lie across limbs."""
     function = load("crypto/mpi_pow_mod.cpp", "raise", kMpiLimbBits=LIMB_BITS,
                     mpi_msb=lambda number: number.value.bit_length())
     for w in (1, 3, 4, 5, 6):
@@ -190,7 +190,7 @@ def main():
         try:
             proof()
             print(f"proved: {name}", flush=True)
-        except Exception as error:  # whatever keeps it from being proved
+        except Exception as error:  # any error means that it is not proved
             print(f"NOT PROVED: {name}: {error!r}", flush=True)
             status = 1
     return status
