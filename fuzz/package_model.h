@@ -1,6 +1,7 @@
 // What may be done for an archive, worked out a second time: the judge of the package target. It
 // reads the archive through the platform's zip library, as the tool does, but the texts with the
-// readers of models.h, the signatures with libcrypto, and the digests on a straight walk.
+// readers of models.h, the signatures with libcrypto, and the digests on a straight walk. Where a
+// library lies the tool itself says; tests/apk/native_libraries_test.cpp has those paths in full.
 #pragma once
 
 #include <map>
