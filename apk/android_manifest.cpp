@@ -1,6 +1,6 @@
-// What the compiled Android manifest says: the package's name, and whether it asks for secure
-// storage. Its texts are the document's, and a hostile one has long texts looked at again and
-// again: they are compared as they are, length first, and none but the package's name is converted.
+// Reads the compiled Android manifest: the package's name, and whether it asks for secure storage.
+// A hostile document makes the parser return the same long texts again and again. Texts are
+// therefore compared as UTF-16, by length first, and only the package's name is converted.
 #include <androidfw/ResourceTypes.h>
 #include <utils/String8.h>
 
@@ -19,7 +19,7 @@ using android::ResXMLParser;
 using android::String8;
 using Text = std::u16string_view;
 
-// A text as the parser answers, null for one that it does not have.
+// A text that the parser returned; empty if it returned null.
 Text View(const char16_t* text, size_t size) { return text == nullptr ? Text() : Text(text, size); }
 
 String8 ReadPackageName(const ResXMLParser& parser, std::set<const char16_t*>* nameless);
@@ -32,8 +32,8 @@ uint16_t FirstUnit(Text text);
 }  // namespace
 
 bool Apk::ParseAndroidManifest(std::vector<uint8_t> bytes) {
-  // The parser reads a header, or an attribute, without asking whether all of it is there, so there
-  // is room for one behind the document. Bytes with no room for a header are no document.
+  // The parser reads a header or an attribute without checking that all of it is there. The buffer
+  // therefore has room for one more behind it. Bytes shorter than a header are not a document.
   const size_t size = bytes.size(), room = size + sizeof(android::ResXMLTree_attribute);
   bytes.reserve(room);
   bytes.resize(room);
@@ -49,7 +49,7 @@ bool Apk::ParseAndroidManifest(std::vector<uint8_t> bytes) {
   std::set<const char16_t*> nameless;
   for (ResXMLParser::event_code_t event = parser.next(); event != ResXMLParser::END_DOCUMENT;
        event = parser.next()) {
-    // Deliberate: a document that turns bad is one that ends early. What was found before stands.
+    // Deliberate: a document that turns bad ends there. The facts found before it count.
     if (event == ResXMLParser::BAD_DOCUMENT) break;
     // Elements count at any depth.
     if (event != ResXMLParser::START_TAG) continue;
@@ -69,15 +69,15 @@ bool Apk::ParseAndroidManifest(std::vector<uint8_t> bytes) {
 
 namespace {
 
-// A text of nothing but unpaired surrogates converts to none. It is converted once, and then it is
-// among the `nameless`.
+// A text of unpaired surrogates alone converts to an empty text. It is converted only once and then
+// kept in `nameless`.
 String8 ReadPackageName(const ResXMLParser& parser, std::set<const char16_t*>* nameless) {
   const Text name = getStrAttr(parser, "package");
   if (name.empty() || !nameless->insert(name.data()).second) return String8();
   return String8(name.data(), name.size());
 }
 
-// Deliberate: a package that declares the permission counts like one that asks for it.
+// Deliberate: a package that declares the permission counts as one that asks for it.
 bool AsksForSecureStorage(const ResXMLParser& parser, Text element) {
   if (Equals(element, "meta-data")) {
     return Equals(getStrAttr(parser, "name"), "access") &&
@@ -89,19 +89,19 @@ bool AsksForSecureStorage(const ResXMLParser& parser, Text element) {
          Equals(name, "com.qix.android.securestorage.permission.SECURE_STORAGE");
 }
 
-// The text of the first attribute of this name that has one; references and numbers have none.
-// Empty if there is no such attribute.
+// The text of the first attribute that has this name and a text: references and numbers have none.
+// Empty if no attribute matches.
 Text getStrAttr(const ResXMLParser& parser, std::string_view name) {
   ResXMLParser::ResXMLPosition position;
   parser.getPosition(&position);
   android::ResXMLTree_attrExt tag;
   memcpy(&tag, position.curExt, sizeof(tag));
   for (size_t i = 0; i < parser.getAttributeCount(); ++i) {
-    // Attributes of size 0 lie in one place. Up to 65,535 of them are one attribute.
+    // Attributes of size 0 all lie at one address: up to 65,535 of them are one attribute.
     if (i > 0 && tag.attributeSize == 0) break;
     size_t length = 0;
     const char16_t* text = parser.getAttributeName(i, &length);
-    // Deliberate: attributes are known by their local names, in any namespace or none.
+    // Deliberate: only the local name of an attribute is compared. Its namespace does not matter.
     if (!Equals(View(text, length), name)) continue;
 
     android::Res_value value = {};
@@ -114,8 +114,8 @@ Text getStrAttr(const ResXMLParser& parser, std::string_view name) {
   return {};
 }
 
-// True if `text` is `wanted` when the platform converts it to UTF-8. That conversion drops unpaired
-// surrogates. Deliberate: so does this, up to a number that keeps every comparison short.
+// True if `text`, converted to UTF-8 by the platform, is `wanted`. That conversion drops unpaired
+// surrogates. Deliberate: this comparison drops them, too, but only a few, so that it stays short.
 bool Equals(Text text, std::string_view wanted) {
   constexpr size_t kMostSurrogates = 16;
   if (text.size() < wanted.size() || text.size() > wanted.size() + kMostSurrogates) return false;
@@ -127,7 +127,7 @@ bool Equals(Text text, std::string_view wanted) {
   return wanted.empty();
 }
 
-// Tells of the first unit of a text that does not begin in the middle of a pair.
+// True if the first unit is an unpaired surrogate. `text` must not begin in the middle of a pair.
 bool IsUnpairedSurrogate(Text text) {
   constexpr int kHigh = 0xD800 >> 10, kLow = 0xDC00 >> 10;
   const int kind = FirstUnit(text) >> 10;
@@ -135,7 +135,7 @@ bool IsUnpairedSurrogate(Text text) {
   return kind == kLow || (kind == kHigh && !is_pair);
 }
 
-// A hostile document has texts and elements at odd addresses.
+// In a hostile document, texts and elements lie at odd addresses.
 uint16_t FirstUnit(Text text) {
   uint16_t unit;
   memcpy(&unit, static_cast<const void*>(text.data()), sizeof(unit));

@@ -1,4 +1,4 @@
-// Init, and the road of a package through its verification.
+// Init, and the steps that verify a package.
 #include "apk/apk.h"
 
 #include <utility>
@@ -7,9 +7,9 @@
 
 namespace ApkTools {
 
-// Deliberate: a pointer that can be changed, and not the text itself. The entry that is read as the
-// manifest is looked up through it at each use. The names that need no digest (CanSkipValidation)
-// do not follow it: they are a table of their own.
+// Deliberate: a pointer that a program may change, not a fixed text. The manifest's entry is looked
+// up through it at each use. The names that need no digest (CanSkipValidation) are a table of their
+// own and do not follow it.
 const char* Apk::kMANIFEST_MF = "META-INF/MANIFEST.MF";
 
 void Apk::Init(int fd, const char* path) {
@@ -32,15 +32,15 @@ void Apk::Init(int fd, const char* path) {
   is_good_apk_ = VerifyPackage(std::move(android_manifest));
 }
 
-// The signature first, then what it vouches for.
+// Checks the signature first, then the files that it covers.
 bool Apk::VerifyPackage(std::vector<uint8_t> android_manifest) {
   std::vector<uint8_t> manifest;
   if (ExtractEntry(kMANIFEST_MF, manifest) != 0) return false;
 
   if (!InitCertSf()) return false;
   if (!ValidateManifest(manifest)) {
-    // Deliberate: ValidateManifest has said the same. Programs that parse the log match on the
-    // pair.
+    // Deliberate: ValidateManifest has logged the same text. Programs that parse the log match on
+    // the pair.
     LogError("Can't validate manifest.\n");
     return false;
   }

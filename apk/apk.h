@@ -1,14 +1,16 @@
-// The opened file: its zip archive, what its manifests say, and how far it verified.
+// The opened file: its zip archive, the facts in its manifests, and how far it verified.
 //
 // An Apk owns its facts, but not the descriptor that it is given. It never writes to the file. Its
-// end closes neither the archive nor the descriptor: the process ends right after the run.
-// Nothing fails by throwing: construction leaves flags that say how far it got, checks answer true
-// or false, and every failure is logged as an error where it is found, unless said otherwise. One
-// thread uses an object from its construction to its end.
+// destructor closes neither the archive nor the descriptor: the process ends right after the run.
+// Release() is for a process that goes on. Nothing throws: the constructor sets flags that say how
+// far it got, and checks return true or false. Every failure is logged as an error where it is
+// found, unless a comment says otherwise. One thread uses an object from its construction to its
+// end.
 #pragma once
 
 #include <cstdint>
 #include <string>
+#include <utility>
 #include <vector>
 
 #include "apk/entry_digests.h"
@@ -18,34 +20,38 @@
 
 namespace ApkTools {
 
-// The name of the signature block that belongs to a signature file: with "RSA" for what follows the
-// name's last dot; the name itself if it has none.
+// The name of the signature block that belongs to a signature file. It replaces the text after the
+// name's last dot by "RSA". A name without a dot is returned unchanged.
 std::string SignatureBlockName(const std::string& signature_file_name);
 
 class Apk {
  public:
-  // The name of the manifest's entry; read at each use.
+  // The name of the manifest's entry, read at each use.
   static const char* kMANIFEST_MF;
 
-  // As Init(fd, nullptr) on an empty object.
+  // Like Init(fd, nullptr) on an empty object.
   explicit Apk(int fd) { Init(fd, nullptr); }
   Apk(const Apk&) = delete;
   Apk& operator=(const Apk&) = delete;
 
   // Opens the file as a zip archive and, when it is a package (it holds "AndroidManifest.xml"),
   // verifies its JAR signature and reads its manifests.
+  // `fd`: the file, open for reading. The caller keeps it open for the life of the object and
+  // closes it. With -1, Init opens `path` itself, for the life of the process. `path`: the file's
+  // name; null takes the descriptor's name in /proc.
   //
-  // `fd`: the file, open for reading; the caller keeps it open for the life of the object and
-  // closes it. -1 makes Init open `path` itself, for the life of the process. `path`: the file's
-  // name; null takes the name that the descriptor has in /proc.
-  //
-  // The outcome is read from the flags below. Called again, it starts from cleared flags; a fact
+  // The flags below tell the outcome. A second call first clears the flags. Facts that it does not
+  // reach keep their former values.
   // that it does not get to keeps what it was.
   void Init(int fd, const char* path);
 
-  // The path given to Init, or the descriptor's; may be empty.
+  // Closes the archive, and the descriptor if Init opened it. The facts stay. Nothing may read an
+  // entry afterwards, and StartIteration fails. Called again, it does nothing.
+  void Release() { CloseArchive(std::exchange(zip_handle_, nullptr)); }
+
+  // The path given to Init, or the descriptor's path; may be empty.
   const std::string& GetPath() const { return path_; }
-  // The descriptor given to Init, or what Init's own open returned.
+  // The descriptor given to Init, or the result of Init's own open.
   int GetFd() const { return fd_; }
   // The file could be opened as a zip archive.
   bool IsGoodZip() const { return is_good_zip_; }
@@ -59,10 +65,11 @@ class Apk {
   // The Android manifest asks for the secure-storage permission.
   bool IsSsPermissionRequired() const { return ss_permission_required_; }
 
-  // Walking the archive: an open archive is needed, and results are the zip library's (0: success).
+  // Walking the archive, which must be open. Results are the zip library's codes (0: success).
   // StartIteration stores a cookie for the entries whose names begin with `prefix` and end with
-  // `suffix`; an empty text filters nothing. Next gives them one by one in the library's order, -1
-  // at their end; `name` changes only with a result of 0. EndIteration releases the cookie.
+  // `suffix`; an empty text filters nothing. Next returns them one by one in the library's order,
+  // and -1 after the last; `name` changes only with a result of 0. EndIteration releases the
+  // cookie.
   int32_t StartIteration(void** cookie, const std::string& prefix, const std::string& suffix) {
     return StartZipIteration(zip_handle_, cookie, prefix, suffix);
   }
@@ -71,40 +78,40 @@ class Apk {
   }
   void EndIteration(void* cookie) { ::EndIteration(cookie); }
 
-  // The steps of Init that read more than the archive. Each answers whether it succeeded.
+  // The steps of Init that read more than the archive. Each returns true for success.
 
-  // Finds the signature file (the first entry "META-INF/….SF" in the archive's order), parses it
-  // and verifies the signature block that belongs to it ("RSA" in place of "SF"). A package without
-  // a signature file, or with one that cannot be extracted, fails without a message.
+  // Finds the signature file (the first entry "META-INF/….SF" in the archive's order), parses it,
+  // and verifies its signature block ("RSA" in place of "SF"). Fails without a message if the
+  // package has no signature file, or if that file cannot be extracted.
   bool InitCertSf();
-  // Whether the block's certificate is signed with its own key and the block's signature, by the
-  // same key, covers the signature file with these digests. On success `key` becomes the key's
-  // modulus, else it is untouched.
+  // True if the block's certificate is signed with its own key, and the block's signature by the
+  // same key covers the signature file with these digests. On success `key` becomes the key's
+  // modulus; otherwise it is untouched.
   bool VerifyCertificate(std::vector<uint8_t>& block, std::vector<uint8_t>& sha1,
                          std::vector<uint8_t>& sha256, std::vector<uint8_t>& md5,
                          std::vector<uint8_t>& key);
-  // Whether the signature file's "-Digest-Manifest" is the digest of `manifest`, the raw manifest.
+  // True if the signature file's "-Digest-Manifest" is the digest of `manifest`, the raw manifest.
   bool ValidateManifest(const std::vector<uint8_t>& manifest);
-  // Whether `expected` is the digest of `data` that a digest attribute of this name holds
+  // True if `expected` is the digest of `data` by the algorithm that `digest_name` names
   // ("SHA1-Digest" or "SHA-256-Digest"). A mismatch is not logged.
   bool VerifyData(const std::string& digest_name, const std::vector<uint8_t>& expected,
                   const std::vector<uint8_t>& data);
   // Reads the package name and the secure-storage permission from a compiled "AndroidManifest.xml".
-  // False only when the bytes are no compiled XML at all; nothing changes then.
+  // Returns false, and changes nothing, only if the bytes are not compiled XML at all.
   bool ParseAndroidManifest(std::vector<uint8_t> bytes);
 
-  // Whether the package verified, and its "classes.dex", if it has one, as well. The first call
-  // checks that entry, later ones remember.
+  // True if the package verified, and its "classes.dex", if it has one, as well. The first call
+  // checks that entry; later calls return the same result.
   bool IsGoodApk();
-  // Whether the entry, as the zip library found it under `name`, has the digest that the manifest
-  // records for the name. A mismatch, and an entry that cannot be extracted, are not logged.
+  // True if the entry, which the zip library found under `name`, has the digest that the manifest
+  // records for the name. Neither a mismatch nor an entry that cannot be extracted is logged.
   bool VerifyEntryHash(const std::string& name, ZipEntry& entry);
-  // Whether the file at `path` has the digest that the manifest records for the entry `name`. A
-  // mismatch is not logged. `state`, unless it is null, tells which file was read, and an `fd`
-  // other than -1 is the file itself (ReadFile). `state` stays as it is if no file was read.
+  // True if the file at `path` has the digest that the manifest records for the entry `name`. A
+  // mismatch is not logged. `state` and `fd` are those of ReadFile: the state of the file that was
+  // read, unless null, and the file itself, unless -1. `state` is unchanged if no file was read.
   bool VerifyFileHash(const std::string& name, const std::string& path,
                       struct stat* state = nullptr, int fd = -1);
-  // Whether `name` is one of the signature's own files, which no manifest lists.
+  // True if `name` is one of the signature's own files, which no manifest lists.
   bool CanSkipValidation(const std::string& name);
 
  private:
@@ -129,8 +136,8 @@ class Apk {
   std::vector<uint8_t> manufacturer_key_;
   bool ss_permission_required_ = false;
   std::string package_name_;
-  // Of the entry or file that was digested last. The memory is kept for the next one: to give it
-  // back and ask for it again costs 2 % of the time of large libraries.
+  // The content of the last digested entry or file. Its memory is kept for the next one: freeing it
+  // and allocating it again costs 2 % of the time of large libraries.
   std::vector<uint8_t> content_;
 };
 

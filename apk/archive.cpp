@@ -1,4 +1,4 @@
-// The archive: opening it, finding and extracting an entry.
+// Opens the archive, finds an entry and extracts it.
 #include <fcntl.h>
 
 #include <cerrno>
@@ -12,7 +12,7 @@
 
 namespace ApkTools {
 
-// Settles descriptor and path, of which the caller may have given but one.
+// Sets the descriptor and the path. The caller may have given only one of them.
 bool Apk::FindFile(const char* path) {
   if (fd_ < 0 && path == nullptr) {
     LogError("Can't initialize Apk: need valid file descriptor or filename\n");
@@ -20,8 +20,8 @@ bool Apk::FindFile(const char* path) {
   }
   if (fd_ == -1) {
     fd_ = open(path, O_RDONLY | O_CLOEXEC);
-    // Deliberate: descriptor 0 is a failure too. It is standard input's, and only a process that
-    // was started without one, not as it should be, could be given it here.
+    // Deliberate: descriptor 0 is a failure, too. It belongs to standard input. open returns it
+    // only in a process that was wrongly started without standard input.
     if (fd_ < 1) {
       LogError("open('%s') failed: %s\n", path, strerror(errno));
       return false;
@@ -31,7 +31,7 @@ bool Apk::FindFile(const char* path) {
   return true;
 }
 
-// With `own_fd`, closing the descriptor becomes the archive's task.
+// With `own_fd`, the archive closes the descriptor.
 bool Apk::OpenZip(bool own_fd) {
   const int32_t result = OpenArchiveFd(fd_, path_.c_str(), &zip_handle_, own_fd);
   if (result != 0) {
@@ -43,13 +43,12 @@ bool Apk::OpenZip(bool own_fd) {
   return true;
 }
 
-// Extracts the entry of this name whole. Results are the zip library's; `out` is untouched when
-// there is no such entry.
+// Extracts the whole entry of this name. Results are the zip library's codes. If the archive has no
+// such entry, `out` is untouched.
 int32_t Apk::ExtractEntry(const std::string& name, std::vector<uint8_t>& out) {
   ZipEntry entry;
   const int32_t result = FindZipEntry(zip_handle_, name, &entry);
-  if (result != 0) return result;
-  return ExtractZipEntry(zip_handle_, &entry, out);
+  return result != 0 ? result : ExtractZipEntry(zip_handle_, &entry, out);
 }
 
 }  // namespace ApkTools

@@ -4,7 +4,7 @@
 
 namespace {
 
-// The place of each is its value.
+// The index of each character is its value.
 constexpr std::string_view kAlphabet =
     "ABCDEFGHIJKLMNOPQRSTUVWXYZabcdefghijklmnopqrstuvwxyz0123456789+/";
 
@@ -22,8 +22,8 @@ int base64decode(const char* in, size_t length, uint8_t* out, size_t* out_length
   size_t written = 0;
   uint32_t accumulator = 0;
   int collected = 0;  // values of 6 bits in the accumulator
-  // Writes the whole bytes of the accumulator, or none. Deliberate: the bits of no whole byte are
-  // dropped without an error, and so is a single value, which makes none.
+  // Writes the whole bytes of the accumulator; false if they do not fit. Deliberate: leftover bits
+  // are dropped without an error, and so is a single value, which has no whole byte.
   const auto flush = [&] {
     const size_t count = collected < 2 ? 0 : static_cast<size_t>(collected) - 1;
     if (*out_length - written < count) return false;

@@ -7,13 +7,13 @@ namespace ApkTools {
 
 namespace {
 
-// Name and value of the digest attribute that counts.
+// The name and the value of the digest attribute that counts.
 ManifestMf::Section::value_type DigestOf(const ManifestMf::Section& section) {
   return section.findLastEndingIn("-Digest");
 }
 
-// Not std::hash: in the C++ libraries of older releases it wraps without being marked, and a
-// product may build with a trap for that.
+// Not std::hash: in older releases its unsigned arithmetic wraps without the mark that sanitizers
+// need, and a product may be built to stop at that.
 size_t Hash(std::string_view name) {
   size_t hash = 0;
   for (const char c : name) hash = (hash << 9 | hash >> 55) ^ static_cast<uint8_t>(c);
@@ -35,13 +35,13 @@ void EntryDigests::List() {
   bool in_order = true;
   for (uint32_t i = 0; i < sections.size(); ++i) {
     const std::string_view name = NameOf(i);
-    // The main section, which names no entry, is left out here as well.
+    // This also leaves out the main section, which names no entry.
     if (name.empty() || DigestOf(sections[i]).first.empty()) continue;
     in_order = in_order && last <= name;
     last = name;
     sections_.push_back(i);
   }
-  // As apksigner writes them. Older tools write them in the order of the archive.
+  // apksigner writes names in order. Older tools write them in the order of the archive.
   if (!in_order) Sort();
 }
 
@@ -64,8 +64,8 @@ bool EntryDigests::Find(std::string_view name, std::string& digest_name,
   return true;
 }
 
-// By the hashes of the names, and by the names where those are equal: to compare names that lie all
-// over a text costs more than to read them once.
+// Sorts by the hashes of the names, and by the names where hashes are equal. Hashing reads each
+// name once. That costs less than comparing names that lie all over a text.
 void EntryDigests::Sort() {
   std::vector<std::pair<size_t, uint32_t>> hashed;
   hashed.reserve(sections_.size());

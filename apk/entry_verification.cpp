@@ -1,4 +1,4 @@
-// Single entries and files against the digests that the manifest records for them.
+// Compares single entries and files with the digests that the manifest records for them.
 #include <set>
 
 #include "apk/apk.h"
@@ -10,8 +10,7 @@
 namespace ApkTools {
 
 bool Apk::IsGoodApk() {
-  if (!is_good_apk_) return false;
-  if (dex_checked_) return true;
+  if (!is_good_apk_ || dex_checked_) return is_good_apk_;
   if (!VerifyDex()) {
     LogError("Integrity not confirmed: classes.dex\n");
     is_good_apk_ = false;
@@ -20,8 +19,7 @@ bool Apk::IsGoodApk() {
   return is_good_apk_;
 }
 
-// Only an archive that has no such entry passes without one; an entry that is there but cannot be
-// read has not been verified.
+// A package without this entry passes. An entry that exists but cannot be read does not.
 bool Apk::VerifyDex() {
   ZipEntry dex;
   const int32_t result = FindZipEntry(zip_handle_, "classes.dex", &dex);
@@ -38,7 +36,7 @@ bool Apk::VerifyFileHash(const std::string& name, const std::string& path, struc
   return VerifyContent(name, [&] { return ReadFile(path, content_, state, fd); });
 }
 
-// `read_content` fills content_, which is empty then, and answers whether it could; it is not
+// `read_content` fills content_, which is empty before, and returns true for success. It is not
 // called for a name that the manifest does not list.
 template <typename ReadContent>
 bool Apk::VerifyContent(const std::string& name, ReadContent read_content) {

@@ -11,35 +11,34 @@ namespace {
 
 bool IsLineBreak(char c) { return c == '\r' || c == '\n'; }
 
-// Of CR, LF and NUL, which end a line.
+// The greatest of CR, LF and NUL, the bytes that end a line.
 constexpr uint8_t kGreatestLineEnd = '\r';
 
-// Whether each of the eight bytes is above all that end a line.
+// True if each of the eight bytes is greater than every byte that ends a line.
 bool IsPlainText(const uint8_t* eight) {
   constexpr uint64_t kEachByte = 0x0101010101010101;
   constexpr uint64_t kHighBits = 0x80 * kEachByte;
   constexpr uint64_t kLeastPlain = (kGreatestLineEnd + 1) * kEachByte;
   uint64_t bytes;
   memcpy(&bytes, eight, sizeof(bytes));
-  // With its high bit set no byte borrows from the next, and it keeps that bit when its other bits
-  // are not below the least.
+  // With its high bit set, no byte borrows from the next. It keeps that bit unless its low seven
+  // bits are below the least plain byte.
   return ((((bytes | kHighBits) - kLeastPlain) | bytes) & kHighBits) == kHighBits;
 }
 
 // The state machine that reads the text of a manifest.
 //
-// It is lenient where signing tools differ: lines may have any length, CR LF, LF CR, CR and LF end
-// them, and a line without a colon only becomes part of the next name. It is strict about the byte
-// after a colon. What it makes of odd line breaks decides which digest belongs to which entry, and
-// is pinned by tests.
+// It is lenient where signing tools differ. Lines may have any length; CR LF, LF CR, CR and LF end
+// them. A line without a colon becomes part of the next name. It is strict about the byte after a
+// colon. Odd line breaks decide which digest belongs to which entry, so tests pin how they are
+// read.
 class Parser {
  public:
   Parser(std::vector<uint8_t>& text, ManifestSections& sections)
       : text_(text.data()), size_(text.size()), sections_(sections) {}
 
-  // Deliberate: what is pending at the end of the text is dropped. Only an empty line ends a
-  // section, the last one included, as signing tools write it; a section that was cut off does not
-  // count.
+  // Deliberate: an attribute or section that is still open at the end of the text is dropped. Only
+  // an empty line ends a section, as signing tools write it, even the last section.
   bool parse() {
     while (cursor_ < size_) {
       if (!isExpectedState() || !step()) return false;
@@ -57,8 +56,8 @@ class Parser {
     P_EOL,           // at a line break, what the next line is being open
   };
 
-  // Deliberate: no step leaves another state behind, and no test gets here with one. The guard
-  // stays, so that one which is added and not handled below cannot make a manifest pass.
+  // Deliberate: no step sets another state, so no test gets here with one. The guard stays, so that
+  // a state that is added but not handled below cannot make a manifest pass.
   bool isExpectedState() const {
     const bool is_expected = state_ <= P_EOL;
     if (!is_expected) LogError("Parse manifest: Unexpected state.\n");
@@ -93,15 +92,15 @@ class Parser {
     state_ = P_KEY;
   }
 
-  // Deliberate: a line break does not end a name. A line without a colon is taken as the front part
-  // of the next line's name, which then names nothing that anybody looks for.
+  // Deliberate: a line break does not end a name. A line without a colon becomes the front part of
+  // the next line's name. Nobody looks for such a name.
   bool readName() {
     storePair();
     size_t end = cursor_;
     while (byteAt(end) != ':' && byteAt(end) != '\0') ++end;
     pending_.name = readTo(end);
     if (byteAt(end) == '\0') {
-      // No more of a long name than the log keeps.
+      // The log keeps no more of a long name.
       const size_t shown = std::min<size_t>(pending_.name.length, kLogTextSize);
       const std::string name(reinterpret_cast<const char*>(text_) + pending_.name.start, shown);
       LogError("Parse manifest: Error: P_KEY: unexpected end of file after key '%s'\n",
@@ -112,11 +111,11 @@ class Parser {
     return true;
   }
 
-  // Deliberate: after a line break that follows the colon at once, the cursor is always two bytes
-  // past the colon, where CR LF has its LF. With a lone LF or CR that byte begins the next line and
-  // is taken for the line break: it is lost from a name, and neither an empty line nor a
-  // continuation line is seen there. Signing tools write CR LF; other files read as they always
-  // have.
+  // Deliberate: if a line break follows the colon at once, the cursor always moves two bytes past
+  // the colon. With CR LF it is then at the LF. With a lone CR or LF it is at the first byte of the
+  // next line, which is then taken for the line break. A name loses its first byte there, and an
+  // empty line or a continuation line is not seen. Signing tools write CR LF; other files read as
+  // they always have.
   bool passColon() {
     const char next = byteAt(cursor_ + 1);
     if (next != ' ' && !IsLineBreak(next)) {
@@ -129,7 +128,7 @@ class Parser {
     return true;
   }
 
-  // The line moves up to the end of the value; what lies between the two is never read again.
+  // Moves the line up to the end of the value. The bytes between the two are never read again.
   void continueValue() {
     const ManifestPiece line = readLine();
     ManifestPiece& value = pending_.value;
@@ -141,7 +140,7 @@ class Parser {
     value.length += line.length;
   }
 
-  // What is left of the line that the cursor is in; the cursor is then on the byte that ended it.
+  // Returns the rest of the cursor's line. The cursor is then on the byte that ended the line.
   ManifestPiece readLine() {
     size_t end = cursor_;
     for (;; ++end) {
@@ -153,14 +152,14 @@ class Parser {
     return readTo(end);
   }
 
-  // What lies from the cursor to `end`, where the cursor is then.
+  // Returns the bytes from the cursor to `end`, and moves the cursor there.
   ManifestPiece readTo(size_t end) {
     const size_t start = std::exchange(cursor_, end);
     return {static_cast<uint32_t>(start), static_cast<uint32_t>(end - start)};
   }
 
-  // Deliberate: the byte under the cursor is a line break whatever it is, a NUL that ended a value
-  // included. Two bytes are one break when the second is CR or LF and not the same again.
+  // Deliberate: the byte under the cursor counts as a line break, even if it is a NUL that ended a
+  // value. Two bytes are one break if the second is CR or LF and differs from the first.
   void endLine() {
     const char first = byteAt(cursor_++);
     if (IsLineBreak(byteAt(cursor_)) && byteAt(cursor_) != first) ++cursor_;
@@ -177,13 +176,13 @@ class Parser {
     }
   }
 
-  // Moves the pending pair into the section, if it is whole; nothing is pending then.
+  // Moves the pending pair into the section if it is whole. Nothing is pending afterwards.
   void storePair() {
     if (pending_.name.length != 0 && pending_.value.length != 0) sections_.add(pending_);
     pending_ = {};
   }
 
-  // The byte at the end of the text reads as NUL, which stops every scan.
+  // Past the end of the text every byte reads as NUL, which stops every scan.
   char byteAt(size_t index) const { return index < size_ ? static_cast<char>(text_[index]) : '\0'; }
 
   uint8_t* const text_;

@@ -1,6 +1,6 @@
-// The text of a JAR manifest or signature file (JAR File Specification, "JAR Manifest" and "Signed
-// JAR File") as sections of attributes. The object owns the text, and all that it hands out points
-// into it. What does not parse is logged as an error, once per load().
+// Parses the text of a JAR manifest or signature file (JAR File Specification, "JAR Manifest" and
+// "Signed JAR File") into sections of attributes. The object owns the text; everything it returns
+// points into that text. A text that does not parse is logged as an error, once per load().
 #pragma once
 
 #include <cstdint>
@@ -14,16 +14,15 @@ class ManifestMf {
   using Section = ManifestSection;
   using Sections = ManifestSections;
 
-  // Holds no text and no sections, and is not valid. An object that was moved from has no sections
-  // either, and still tells the result; what pointed into its text points into the one that it was
-  // moved to.
+  // Holds no text and no sections, and is not valid. A moved-from object has no sections either,
+  // but keeps the result. Views into its text now point into the object that received the text.
   ManifestMf() = default;
   ManifestMf(ManifestMf&&) = default;
   ManifestMf& operator=(ManifestMf&&) = default;
 
-  // Forgets everything and parses `text`, any bytes. False when it does not parse; the sections
-  // that ended before the fault are there all the same. A text of 4 GiB or more, which no entry of
-  // an archive is, does not parse and is not logged.
+  // Forgets everything and parses `text`, which may be any bytes. Returns false if it does not
+  // parse; the sections that ended before the fault are kept. A text of 4 GiB or more does not
+  // parse and is not logged: no entry of an archive is that long.
   bool load(std::vector<uint8_t> text);
   bool load(const std::string& text) {
     return load(std::vector<uint8_t>(text.begin(), text.end()));
@@ -33,7 +32,7 @@ class ManifestMf {
   explicit operator bool() const { return valid_; }
 
   // The sections of the last load() that an empty line ended, in the order of the text, the main
-  // section first. Good until the object is loaded again or moved.
+  // section first. Valid until the object is loaded again or moved.
   const Sections& getSections() const { return sections_; }
 
  private:

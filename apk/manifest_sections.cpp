@@ -26,9 +26,9 @@ std::string_view ManifestSection::find(std::string_view name) const {
   return View(text_, found->value);
 }
 
-// Deliberate: of several digests the last in the order of names counts, so that "SHA1-Digest" goes
-// before "SHA-256-Digest", for an entry as for the whole manifest. It is the order in which
-// packages that carry both have always been judged.
+// Deliberate: of several digests the last in the order of names counts, so "SHA1-Digest" goes
+// before "SHA-256-Digest", for an entry as for the whole manifest. Packages that carry both have
+// always been judged by this order.
 ManifestSection::value_type ManifestSection::findLastEndingIn(std::string_view suffix) const {
   for (size_t i = size_; i > 0; --i) {
     if (EndsWith(View(text_, attributes_[i - 1].name), suffix)) return (*this)[i - 1];
@@ -42,8 +42,9 @@ ManifestSection ManifestSections::operator[](size_t index) const {
 }
 
 void ManifestSections::reset(const uint8_t* text, size_t size) {
-  // Few attributes are shorter, and no archive has more entries than need so many. A table that
-  // grows in steps would leave its former memory behind; this one takes none before it is filled.
+  // Few attributes take less text than kShortAttribute, and no archive has more entries than
+  // kManyAttributes can list. A table that grew in steps would waste its former memory. This one
+  // takes memory only as it is filled.
   constexpr size_t kShortAttribute = 32;
   constexpr size_t kManyAttributes = 1 << 17;
   text_ = reinterpret_cast<const char*>(text);
@@ -53,10 +54,10 @@ void ManifestSections::reset(const uint8_t* text, size_t size) {
   patience_ = kLittleText;
 }
 
-// A section is put in order, which drops what repeats, each time that as much text has followed as
-// its names take and twice as many attributes need: so what repeats takes no more memory than what
-// does not, and the names are compared again only when there is as much to be read, however few
-// and long they are.
+// Sorting a section drops repeated names. It is sorted again only after the text has advanced by
+// the length of each of its names and kTwoAttributes more, the text of two short attributes.
+// Repeated names therefore take no more memory than others, and long names are not compared for
+// every few bytes read.
 void ManifestSections::add(const ManifestAttribute& attribute) {
   constexpr size_t kTwoAttributes = 10;
   attributes_.push_back(attribute);
@@ -74,8 +75,7 @@ void ManifestSections::endSection() {
   patience_ = kLittleText + (attributes_.empty() ? 0 : attributes_.back().name.start);
 }
 
-// Puts the section at hand in the order of its names. Of equal names the one that is last in the
-// text stays.
+// Sorts the open section by name. Of equal names it keeps the one that is last in the text.
 void ManifestSections::order() {
   const auto name = [this](const ManifestAttribute& a) { return View(text_, a.name); };
   const auto is_out_of_order = [&](const ManifestAttribute& a, const ManifestAttribute& b) {

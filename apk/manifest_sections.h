@@ -1,5 +1,5 @@
-// The sections of a manifest, as one flat table: an attribute is two pieces of a text that somebody
-// else owns, a section is a run of attributes. No string is copied, and nothing is logged.
+// The sections of a manifest, as one flat table. An attribute is two pieces of a text that the
+// caller owns; a section is a run of attributes. No string is copied, and nothing is logged.
 #pragma once
 
 #include <cstddef>
@@ -9,8 +9,8 @@
 #include <utility>
 #include <vector>
 
-// A piece of the text, in bytes from its start. No entry of an archive is longer than 2^32 - 1
-// bytes, and a large manifest has some hundred thousand pieces.
+// A piece of the text, in bytes from its start. 32 bits are enough for any entry of an archive, and
+// they keep the table small: a large manifest has some hundred thousand pieces.
 struct ManifestPiece {
   uint32_t start = 0;
   uint32_t length = 0;
@@ -21,7 +21,7 @@ struct ManifestAttribute {
   ManifestPiece value;
 };
 
-// Walks what can be asked for its elements by number, and makes each as it is asked for.
+// Iterates over a range by index, and makes each element when it is read.
 template <typename Range>
 class ElementIterator {
  public:
@@ -45,8 +45,8 @@ class ElementIterator {
   size_t index_;
 };
 
-// Attribute values by name, in byte order of the names: an ordered map. Of equal names in the text
-// the last one counts. Neither a name nor a value is ever empty.
+// Attribute values by name, in byte order of the names: an ordered map. Of equal names the last one
+// in the text counts. Names and values are never empty.
 class ManifestSection {
  public:
   // Name and value.
@@ -60,9 +60,9 @@ class ManifestSection {
   ElementIterator<ManifestSection> begin() const { return {this, 0}; }
   ElementIterator<ManifestSection> end() const { return {this, size_}; }
 
-  // The value of the attribute of this name; empty when there is none.
+  // The value of the attribute of this name; empty if the section does not have it.
   std::string_view find(std::string_view name) const;
-  // The last of the attributes whose names end so; two empty texts when there is none.
+  // The last attribute, in order, whose name ends in `suffix`; two empty texts if no name does.
   value_type findLastEndingIn(std::string_view suffix) const;
 
  private:
@@ -81,13 +81,13 @@ class ManifestSections {
   ElementIterator<ManifestSections> begin() const { return {this, 0}; }
   ElementIterator<ManifestSections> end() const { return {this, size()}; }
 
-  // How they come to be. Forgets all; what is added from now on are pieces of the `size` bytes at
-  // `text`.
+  // The parser fills the table by the three functions below. reset forgets everything; attributes
+  // that are added later are pieces of the `size` bytes at `text`.
   void reset(const uint8_t* text, size_t size);
-  // Adds an attribute to the section at hand, none of whose pieces is empty. Names that repeat take
+  // Adds an attribute, neither of whose pieces is empty, to the open section. Repeated names take
   // no memory.
   void add(const ManifestAttribute& attribute);
-  // Ends the section at hand, which may be empty. Until it has ended it is not there.
+  // Ends the open section, which may be empty. Only ended sections are visible.
   void endSection();
 
  private:

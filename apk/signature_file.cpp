@@ -55,7 +55,7 @@ bool Apk::ExtractSignatureFile(std::string& name, std::vector<uint8_t>& content)
   return found == 0 && ExtractZipEntry(zip_handle_, &entry, content) == 0;
 }
 
-// Deliberate: only RSA blocks are looked for; no key of another kind is supported.
+// Deliberate: only RSA blocks are looked for, because only RSA keys are supported.
 std::string SignatureBlockName(const std::string& signature_file_name) {
   const size_t dot = signature_file_name.rfind('.');
   if (dot == std::string::npos) return signature_file_name;
@@ -67,7 +67,7 @@ bool Apk::VerifyCertificate(std::vector<uint8_t>& block, std::vector<uint8_t>& s
                             std::vector<uint8_t>& key) {
   pkcs7 record = {};
   if (processCert(block.data(), static_cast<uint32_t>(block.size()), &record) != 0) {
-    // Deliberate: without a line end. Programs that parse the log match on the text.
+    // Deliberate: the text has no line end. Programs that parse the log match on it.
     LogError("Unknown certificate type");
     return false;
   }
@@ -77,8 +77,8 @@ bool Apk::VerifyCertificate(std::vector<uint8_t>& block, std::vector<uint8_t>& s
     LogError("RSA could not set key: %X\n", static_cast<unsigned>(result));
     return false;
   }
-  // Deliberate: the certificate's own key must have signed it. Who issued it is not asked, there is
-  // no store of trusted issuers.
+  // Deliberate: the certificate must be signed with its own key. Its issuer is not checked: the
+  // tool has no store of trusted issuers.
   const uint8_t* const tbs = record.tbs_data;
   const Digests tbs_digests = ComputeDigests({tbs, tbs + record.tbs_data_length});
   result = VerifySignature(rsa, block, tbs_digests, record.cert_signature);
@@ -91,8 +91,8 @@ bool Apk::VerifyCertificate(std::vector<uint8_t>& block, std::vector<uint8_t>& s
     LogError("RSA could not verify data: %X\n", static_cast<unsigned>(result));
     return false;
   }
-  // Deliberate: keys as long as this never verify above, so that no test gets here. The guard stays
-  // for what takes the key, which has room for no more.
+  // Deliberate: longer keys never verify above, so no test gets here. The guard protects the users
+  // of the key, which have no room for more.
   if (record.modulus_length > kLongestKey) return false;
   key.assign(record.modulus, record.modulus + record.modulus_length);
   return true;
@@ -110,7 +110,7 @@ bool Apk::ValidateManifest(const std::vector<uint8_t>& manifest) {
     const std::string digest_name(name.substr(0, name.size() - kManifest.size()));
     const std::vector<uint8_t> expected = Base64Decode(std::string(value));
     if (!expected.empty() && VerifyData(digest_name, expected, manifest)) return true;
-    // Deliberate: the first section with a digest decides; a later one cannot repair it.
+    // Deliberate: the first section with a digest decides. A later one cannot repair it.
     break;
   }
   LogError("Can't validate manifest.\n");
@@ -119,9 +119,9 @@ bool Apk::ValidateManifest(const std::vector<uint8_t>& manifest) {
 
 bool Apk::VerifyData(const std::string& digest_name, const std::vector<uint8_t>& expected,
                      const std::vector<uint8_t>& data) {
-  // Deliberate: these two alone, one of which every manifest has that a package's signing tool
-  // wrote. What another tool may have chosen (MD5, SHA-512) is refused. It is otherwise with
-  // signatures: old packages have them over MD5, and those verify.
+  // Deliberate: only these two digests. Every manifest that a package's signing tool wrote has one
+  // of them. Others (MD5, SHA-512) are refused. Signatures differ: those of old packages are over
+  // MD5, and they verify.
   std::vector<uint8_t> computed;
   if (digest_name == "SHA1-Digest") {
     ComputeSHA1Digest(data, computed);
@@ -136,26 +136,26 @@ bool Apk::VerifyData(const std::string& digest_name, const std::vector<uint8_t>&
 
 namespace {
 
-// `start` points into the block, or to its end.
+// `start` must point into the block or to its end.
 bool FitsInBlock(const std::vector<uint8_t>& block, const uint8_t* start, size_t length) {
   const auto offset = static_cast<size_t>(start - block.data());
   return offset <= block.size() && length <= block.size() - offset;
 }
 
-// Loads the record's key into `key`. Returns rsa_set_key's result, or bad input for a key that the
-// block ends before, and for an exponent of 1 or -1.
+// Loads the record's key into `key`. Returns rsa_set_key's result, or kRsaBadInput if the key
+// extends beyond the block or its exponent is 1 or -1.
 int LoadKey(const std::vector<uint8_t>& block, const pkcs7& record, rsa_context& key) {
   if (!FitsInBlock(block, record.modulus, record.modulus_length)) return kRsaBadInput;
-  // Deliberate: four bytes in the order of the host, though certificates have the high one first.
-  // That is right for the exponents that signing tools make, which have one byte or are 65537.
+  // Deliberate: four bytes in host byte order, although certificates have the high byte first. That
+  // is right for the exponents that signing tools make: they have one byte or are 65537.
   uint32_t exponent;
   memcpy(&exponent, record.exponent, sizeof(exponent));
   if (rsa_is_forgeable(exponent)) return kRsaBadInput;
   return rsa_set_key(&key, record.modulus, nullptr, exponent, record.modulus_length);
 }
 
-// rsa_pkcs1_verify of a signature in the block, which is as long as the modulus whatever length the
-// block states; bad input where the block ends before it does.
+// Calls rsa_pkcs1_verify for a signature in the block. The signature is as long as the modulus; the
+// length in the block is ignored. Returns kRsaBadInput if the block ends before the signature does.
 int VerifySignature(const rsa_context& key, const std::vector<uint8_t>& block,
                     const Digests& digests, const uint8_t* signature) {
   if (!FitsInBlock(block, signature, static_cast<size_t>(key.len))) return kRsaBadInput;

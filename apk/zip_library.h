@@ -1,8 +1,8 @@
 // The platform's zip library, as the package model uses it.
 //
-// Two generations of it are in use: up to API 29 it takes names as `ZipString`, later as
-// std::string_view. Only this file sees the difference. Archives, entries and cookies are the
-// library's own; all results are its codes (0: success). Nothing is logged.
+// The library has two generations: up to API 29 it takes names as `ZipString`, later as
+// std::string_view. Only this file sees the difference. The library owns archives, entries and
+// cookies. All results are its codes (0: success). Nothing is logged.
 #pragma once
 
 #include <ziparchive/zip_archive.h>
@@ -22,19 +22,19 @@ inline constexpr int32_t kZipInvalidEntryName = -10;
 // The longest name that a zip archive, and a `ZipString`, can hold, in bytes.
 inline constexpr size_t kZipLongestName = 0xffff;
 
-// A name as the library at hand takes it, told by what its FindEntry takes: the template is there
-// for the later generation alone.
+// The type of a name in the installed library. The first overload exists only if FindEntry takes a
+// std::string_view, that is, in the later generation.
 template <typename Entry>
 auto ZipNameFor(Entry* entry)
     -> decltype(FindEntry(ZipArchiveHandle(), std::string_view(), entry), std::string_view());
 ZipString ZipNameFor(...);
 using ZipName = decltype(ZipNameFor(static_cast<ZipEntry*>(nullptr)));
 
-// Below, the templates are for `ZipString`, or a look-alike of it; the names point into the texts.
+// The templates below are for `ZipString` or a look-alike of it. The names point into the texts.
 
 inline void SetZipName(std::string_view& name, const std::string& text) { name = text; }
-// Field by field: the type's constructor from a C string would stop at a NUL, and abort on a long
-// name.
+// Sets the fields one by one: the constructor from a C string would stop at a NUL and abort on a
+// long name.
 template <typename Name>
 void SetZipName(Name& name, const std::string& text) {
   name.name = reinterpret_cast<const uint8_t*>(text.data());
@@ -47,14 +47,14 @@ std::string_view ZipNameText(const Name& name) {
   return {reinterpret_cast<const char*>(name.name), name.name_length};
 }
 
-// A filter of names. The older generation takes a null pointer for none.
+// A filter of names. The older generation takes a null pointer for an empty filter.
 inline std::string_view ZipFilter(std::string_view name) { return name; }
 template <typename Name>
 const Name* ZipFilter(const Name& name) {
   return name.name_length == 0 ? nullptr : &name;
 }
 
-// Looks up the entry of this name, which may hold any bytes.
+// Finds the entry of this name, which may hold any bytes.
 inline int32_t FindZipEntry(ZipArchiveHandle archive, const std::string& text, ZipEntry* entry) {
   if (text.size() > kZipLongestName) return kZipInvalidEntryName;
   ZipName name;
@@ -62,8 +62,8 @@ inline int32_t FindZipEntry(ZipArchiveHandle archive, const std::string& text, Z
   return FindEntry(archive, name, entry);
 }
 
-// Starts to walk the entries whose names begin with `prefix` and end with `suffix`; an empty text
-// filters nothing.
+// Starts a walk over the entries whose names begin with `prefix` and end with `suffix`; an empty
+// text filters nothing.
 inline int32_t StartZipIteration(ZipArchiveHandle archive, void** cookie, const std::string& prefix,
                                  const std::string& suffix) {
   if (prefix.size() > kZipLongestName || suffix.size() > kZipLongestName) {
@@ -75,7 +75,7 @@ inline int32_t StartZipIteration(ZipArchiveHandle archive, void** cookie, const 
   return StartIteration(archive, cookie, ZipFilter(first), ZipFilter(last));
 }
 
-// The next entry and its name; unless the result is 0, `name` stays as it was.
+// Returns the next entry and its name; `name` is unchanged unless the result is 0.
 inline int32_t NextZipEntry(void* cookie, ZipEntry* entry, std::string& name) {
   ZipName found;
   const int32_t result = Next(cookie, entry, &found);

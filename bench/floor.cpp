@@ -1,5 +1,5 @@
-// bench_floor FILE: the least that the tool's job can cost. Opens the archive, extracts what the
-// tool extracts, digests what the tool digests and writes the same log; verifies nothing.
+// bench_floor FILE: the least that the tool's job can cost. It opens the archive, extracts and
+// digests the same bytes as the tool and writes the same log. It verifies nothing.
 #include <openssl/md5.h>
 #include <openssl/sha.h>
 

@@ -136,7 +136,7 @@ void ReadWhole(const std::string& path, Buffer& out) {
   close(fd);
 }
 
-// The kernel of a workstation lacks the feature: asking ends at the missing integrity file.
+// A workstation's kernel lacks the feature, so the question ends at the missing integrity file.
 void AskKernel(int /*fd*/) {
   LogInfo("VeltSignOat: Apk case.\n");
   FILE* const integrity = fopen("/proc/self/integrity/value", "r");

@@ -1,6 +1,6 @@
-// What the floor and the peer have in common: everything of the tool's job but the verification,
-// each step done once and nothing kept that is not needed. They only ever see the good packages of
-// bench_packages, and give up where something fails.
+// The steps that the floor and the peer share: all of the tool's job except the verification. Each
+// step is done once, and nothing is kept that is not needed. Both programs only ever read the good
+// packages of bench_packages, and exit if anything fails.
 #pragma once
 
 #include <cstdint>
@@ -9,7 +9,7 @@
 #include <string>
 #include <string_view>
 
-// Bytes that are not cleared before they are filled. Never shrinks.
+// A buffer whose bytes are not cleared before they are filled. It never shrinks.
 class Buffer {
  public:
   void Resize(size_t size);
@@ -35,11 +35,11 @@ struct GivenPackage {
 GivenPackage OpenGiven(int argc, char** argv);
 void Extract(const GivenPackage& package, const std::string& name, Buffer& out);
 std::string SignatureFileName(const GivenPackage& package);
-// The package's name, from the compiled manifest.
+// Returns the package's name from the compiled manifest.
 std::string WalkManifest(const Buffer& compiled_manifest);
 
-// Reads each library beside the package whole, has `check` look at its entry's name and its bytes,
-// and then has the kernel asked to sign it, as the tool would.
+// Reads each whole library beside the package, calls `check` with its entry's name and its bytes,
+// and then asks the kernel to sign it, as the tool would.
 using CheckLibrary = std::function<void(const std::string& name, const Buffer& content)>;
 void SignLibraries(const GivenPackage& package, const CheckLibrary& check);
 void SignGiven(const GivenPackage& package);

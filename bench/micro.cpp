@@ -1,5 +1,5 @@
-// What the parts cost that the tool does on its own: its arithmetic beside that of the platform's
-// libcrypto and of GMP, and its readers of text.
+// Measures parts of the tool: its arithmetic, beside that of the platform's libcrypto and of GMP,
+// and its readers of text.
 #include <benchmark/benchmark.h>
 #include <gmp.h>
 #include <openssl/bn.h>
@@ -21,7 +21,8 @@ namespace {
 
 std::string KeyOf(const benchmark::State& state) { return "rsa-" + std::to_string(state.range(0)); }
 
-// The modulus of the test key, as bytes and as limbs, and another number of its length below it.
+// The modulus of the test key, as bytes and as limbs, and another number of the same length below
+// it.
 struct Operands {
   explicit Operands(const std::string& key) : modulus(ModulusOf(key)) {
     mpi_from_bytes(&N, modulus.data(), modulus.size());
@@ -57,7 +58,7 @@ void MontMul(benchmark::State& state) {
 }
 BENCHMARK(MontMul)->Name("mpi_montmul")->Arg(1024)->Arg(2048)->Arg(4096);
 
-// R^2 mod N, the one long division of a public operation.
+// R^2 mod N: the only long division of a public operation.
 void ModMpi(benchmark::State& state) {
   Operands operands(KeyOf(state));
   mpi_local power, remainder;
@@ -70,7 +71,8 @@ BENCHMARK(ModMpi)->Name("mpi_mod_mpi")->Arg(1024)->Arg(2048)->Arg(4096);
 
 const Bytes kSigned(1000, 'x');
 
-// A public operation with a key that was not used before, from its bytes on.
+// A public operation with a key that was not used before. Loading the key from its bytes is
+// included.
 void Tool(benchmark::State& state) {
   const Bytes modulus = ModulusOf(KeyOf(state));
   const Bytes signature = SignWith(KeyOf(state), Digest::kSha256, kSigned);
@@ -130,7 +132,7 @@ void Gmp(benchmark::State& state) {
 }
 BENCHMARK(Gmp)->Name("public/gmp")->Arg(1024)->Arg(1536)->Arg(2048)->Arg(3072)->Arg(4096);
 
-// A manifest of so many entries.
+// Loads a manifest with the given number of entries.
 void Load(benchmark::State& state) {
   JarText manifest = JarText::Manifest().EndSection();
   for (int64_t i = 0; i < state.range(0); ++i) {

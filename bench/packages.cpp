@@ -1,8 +1,8 @@
-// bench_packages DIRECTORY: makes the packages that the tool is measured on, each as
+// bench_packages DIRECTORY: makes the packages that the benchmarks measure. Each is
 // DIRECTORY/<name>/base.apk with its libraries extracted beside it, as an installer leaves them.
 //
-// The contents are what the machine has: machine code of its own libraries and the files of
-// /usr/share, since zeros and noise would cost an inflate what no real package does.
+// The contents come from the machine: its own libraries and the files of /usr/share. Zeros and
+// noise would cost an inflate other times than a real package does.
 #include <algorithm>
 #include <cstdio>
 #include <filesystem>
@@ -19,13 +19,13 @@ namespace {
 
 struct Plan {
   const char* name;
-  size_t entries;  // all in all, without the signature's own
+  size_t entries;  // all entries but the signature's own
   size_t libraries;
   size_t library_size;
   size_t dex_size;
   size_t entry_size;  // of each other entry
   const char* key = "rsa-2048";
-  bool in_order = true;  // of their names, as apksigner lists them; else as jarsigner does
+  bool in_order = true;  // entry names sorted, as apksigner lists them; else as jarsigner does
 };
 
 constexpr size_t kKilo = 1000, kMega = 1000 * kKilo;
@@ -42,7 +42,7 @@ constexpr Plan kPlans[] = {
     {"entries-60k-unordered", 60000, 0, 0, 20 * kKilo, 40, "rsa-2048", false},
 };
 
-// The bytes of all large enough files below a directory, one after the other, for ever.
+// Delivers the bytes of all large files below a directory, one after the other, again and again.
 class CircleOfFiles {
  public:
   CircleOfFiles(const std::string& directory, size_t least_size);
@@ -138,7 +138,7 @@ std::string EntryName(size_t index) {
   return kDirectories[index % 5] + std::string("entry_") + std::to_string(index) + ".bin";
 }
 
-// Has the signature file list the digests of the manifest's sections, as signing tools do.
+// Makes the signature file list the digests of the manifest's sections, as signing tools do.
 void DescribeEntries(PackageOptions& options, std::string& manifest) {
   options.edit_manifest = [&](const std::string& text) { return manifest = text; };
   options.edit_signature_file = [&](const std::string& text) {

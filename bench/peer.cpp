@@ -1,4 +1,4 @@
-// bench_peer FILE: the tool's job done with OpenSSL: its PKCS#7, X.509 and digests, and a hash
+// bench_peer FILE: does the tool's job with OpenSSL: its PKCS#7, X.509 and digests, and a hash
 // table of the manifest's entries.
 #include <openssl/evp.h>
 #include <openssl/pkcs7.h>
@@ -54,8 +54,8 @@ int main(int argc, char** argv) {
 
 namespace {
 
-// Returns the signer's modulus. As for the tool, the certificate must have signed itself, and no
-// issuer is asked.
+// Returns the signer's modulus. As in the tool, the certificate must be signed with its own key,
+// and its issuer is not checked.
 std::vector<uint8_t> VerifySignature(const Buffer& block, const Buffer& signature_file) {
   const uint8_t* at = block.data();
   PKCS7* const pkcs7 = d2i_PKCS7(nullptr, &at, static_cast<long>(block.size()));

@@ -18,8 +18,8 @@ TOOL, FLOOR, PEER = (f'{BUILD}/bin/{name}' for name in ('apktoolkit', 'bench_flo
 MICRO = [f'{BUILD}/bench/bench_micro', f'{BUILD}/bench/bench_micro_openssl']
 DOCUMENT = 'docs/performance.md'
 
-# Rounds, what the tool may cost at most, as ratios over floor and peer, of memory over the floor
-# (None: no target is set), and the margin of all three.
+# Rounds; the most that the tool may cost, as a ratio to the floor, to the peer, and of memory to
+# the floor's (None: no target); and the margin of all three ratios.
 Package = collections.namedtuple('Package', 'name rounds floor peer memory margin')
 PACKAGES = [
     Package('small', 101, 1.07, 0.90, 1.03, 0.05),
@@ -83,7 +83,7 @@ def measure(package):
 
 
 def expect_same_log(package):
-    """The three have done the same job when they wrote the same."""
+    """The three programs did the same job if they wrote the same log."""
     logs = {re.sub(r'\d\d-\d\d \d\d:\d\d:\d\d +\d+ +\d+', '', subprocess.run(
         [program, package_path(package.name)], check=True, capture_output=True, text=True).stderr)
         for program in (TOOL, FLOOR, PEER)}
@@ -96,7 +96,7 @@ def median(runs, column):
 
 
 def ratio(runs, other, column):
-    """The median of the ratios pair by pair, of runs that followed one another."""
+    """The median of the ratios of runs that followed one another."""
     return statistics.median(a[column] / b[column] for a, b in zip(runs[TOOL], runs[other]))
 
 
@@ -138,7 +138,7 @@ def growth(runs, start_up):
 
 
 def measure_outside(package):
-    """Seconds of wall clock that the JDK's tools take, which check every entry."""
+    """The wall-clock seconds of the JDK's tools, which check every entry."""
     commands = (['apksigner', 'verify', '--min-sdk-version', '18', '--max-sdk-version', '23'],
                 ['jarsigner', '-verify'])
     times = []
@@ -194,7 +194,7 @@ def instructions_per_limb(limbs=128):
 # ---- Parts.
 
 def measure_micro():
-    """Nanoseconds of processor time by name, medians of runs in turns."""
+    """Nanoseconds of processor time by name: the medians of runs in turns."""
     samples = collections.defaultdict(list)
     for _ in range(3):
         for program in MICRO:
@@ -248,13 +248,13 @@ def text_table():
         yield '| ' + ' | '.join(cells) + ' |'
 
 
-# What a sample counts for, by the file that it fell into; the first that matches.
+# The part that a sample counts for, by the file that it fell into. The first match wins.
 PARTS = (('start-up', r'/ld-linux'), ('kernel', r'kernel'), ('inflate', r'/libz\.'),
          ('digests', r'/libcrypto\.'), ("the tool's own code", r'/apktoolkit$'), ('libraries', r''))
 
 
 def measure_parts(package):
-    """Shares of the processor time; None where there is no perf."""
+    """Shares of the processor time; None if perf is missing."""
     data = f'{BUILD}/perf.data'
     run = [f'{BUILD}/bench/bench_run', str(package.rounds // 3), TOOL, '/bin/true', '--',
            package_path(package.name)]

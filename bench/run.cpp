@@ -1,9 +1,9 @@
 // bench_run ROUNDS PROGRAM... -- FILE: starts the programs with FILE in turns (A B C A B C ...), so
-// that whatever else the machine does meets them alike, and prints a line for each run:
+// that other load on the machine affects all of them alike. Prints a line for each run:
 //
 //   PROGRAM <TAB> wall microseconds <TAB> cpu microseconds <TAB> peak resident kilobytes
 //
-// A small program of its own: the peak of a child counts from the memory of its parent.
+// The program is small and separate, because a child's peak memory starts at that of its parent.
 #include <fcntl.h>
 #include <spawn.h>
 #include <sys/resource.h>
@@ -31,7 +31,7 @@ void Fail(const char* what) {
   exit(1);
 }
 
-// The output of the program goes to /dev/null.
+// Runs the program. Its output goes to /dev/null.
 void Run(char* program, char* file, const posix_spawn_file_actions_t* silent) {
   char* arguments[] = {program, file, nullptr};
   const long long start = Now();

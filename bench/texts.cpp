@@ -1,10 +1,10 @@
-// bench_texts: what the worst texts cost the readers of META-INF/MANIFEST.MF and of the compiled
-// Android manifest, in memory and time. A line for each text:
+// bench_texts: measures the memory and time that the readers of META-INF/MANIFEST.MF and of the
+// compiled Android manifest need for the worst texts. Prints a line for each text:
 //
 //   READER <TAB> NAME <TAB> peak bytes for each byte of the text <TAB> nanoseconds for each byte
 //
-// The text itself is one of the bytes. Each is read in a process of its own, since the peak of a
-// process never falls.
+// The peak includes the text itself, which is one byte for each byte. Each text is read in a
+// process of its own, because the peak of a process never falls.
 #include <sys/wait.h>
 #include <unistd.h>
 
@@ -25,7 +25,7 @@ namespace {
 
 constexpr size_t kTextSize = 64 << 20;
 
-// Appends pieces, which may depend on their numbers, until the text is long enough.
+// Appends pieces, each made from its number, until the text is long enough.
 template <typename MakePiece>
 std::vector<uint8_t> Repeat(const MakePiece& make_piece) {
   std::vector<uint8_t> text;
@@ -39,7 +39,7 @@ std::vector<uint8_t> Repeat(const MakePiece& make_piece) {
   return text;
 }
 
-// The shortest names there are, in an order that is none.
+// The shortest possible names, not sorted.
 std::string ShortName(size_t i) {
   std::string name;
   for (size_t rest = i * 2654435761U % (1U << 28); rest > 0; rest /= 64) {
@@ -79,7 +79,7 @@ constexpr Text kTexts[] = {
     {"one name without end", [] { return Repeat([](size_t) { return "A"; }); }},
 };
 
-// Numbers that deflate to a thousandth.
+// Counts and lengths whose documents deflate to a thousandth of their size.
 constexpr size_t kManyNodes = 1 << 20;
 constexpr size_t kLongName = 30000;
 
@@ -123,7 +123,7 @@ constexpr Reader kReaders[] = {
      std::size(kDocuments)},
 };
 
-// The most memory that the process has had since its peak was reset.
+// The peak memory of the process since ResetPeak.
 long PeakKilobytes() {
   std::ifstream status("/proc/self/status");
   for (std::string word; status >> word;) {
@@ -132,7 +132,7 @@ long PeakKilobytes() {
   return 0;
 }
 
-// The memory that making the text took does not count.
+// Leaves out the memory that it took to make the text.
 void ResetPeak() { std::ofstream("/proc/self/clear_refs") << "5"; }
 
 void Measure(const Reader& reader, const Text& text) {
@@ -147,7 +147,7 @@ void Measure(const Reader& reader, const Text& text) {
          static_cast<double>(PeakKilobytes()) * 1024 / size, time.count() / size);
 }
 
-// In a process of its own; false if that failed.
+// Measures in a child process. Returns false if that failed.
 bool MeasureApart(const Reader& reader, const Text& text) {
   fflush(stdout);
   const pid_t child = fork();

@@ -1,6 +1,6 @@
-# The language level and the warnings that every target is built with, and what the tool's own code
-# is held to on top of them. Warnings are errors in the developers' presets alone: a new warning of a
-# newer compiler must not stop a build of the packages.
+# The language level and the warnings of every target, and stricter rules for the tool's own code.
+# Only the developers' presets turn warnings into errors: a new warning of a newer compiler must not
+# stop a package build.
 set(CMAKE_CXX_STANDARD 17)
 set(CMAKE_CXX_STANDARD_REQUIRED ON)
 set(CMAKE_CXX_EXTENSIONS OFF)
@@ -14,10 +14,10 @@ set(CMAKE_CXX_FLAGS_RELEASE "-O2")
 add_compile_options(-Wall -Wextra)
 set(APKTOOLKIT_TOOL_OPTIONS -fno-exceptions -fno-rtti -Wconversion)
 
-# What the platform hardens its own programs with. Symbols are bound before the program starts, and
-# their table is read-only then; programs lie anywhere in memory; the stack is protected; calls are
-# checked where the compiler knows how much room there is; on 64-bit Arm so are jumps and returns.
-# scripts/check-binary looks for all of it in what was made.
+# The hardening that the platform uses for its own programs. Symbols are bound before the program
+# starts, and their table is then read-only. Programs can be loaded at any address. The stack is
+# protected. Calls are checked where the compiler knows the size of a buffer. On 64-bit Arm, jumps
+# and returns are protected, too. scripts/check-binary checks all of it in the compiled files.
 option(APKTOOLKIT_HARDEN "Harden programs and libraries as the platform does" ON)
 if(APKTOOLKIT_HARDEN)
   include(CheckPIESupported)
@@ -40,7 +40,7 @@ if(APKTOOLKIT_SANITIZE)
   add_link_options(-fsanitize=${APKTOOLKIT_SANITIZE})
 endif()
 
-# Unsigned numbers may wrap, but in the tool only where it says that it means them to
+# Unsigned arithmetic may wrap in the tool only in the functions that are marked for it
 # (crypto/wrapping.h).
 option(APKTOOLKIT_CHECK_OVERFLOW "Take unsigned overflow for a mistake (clang)" OFF)
 if(APKTOOLKIT_CHECK_OVERFLOW)

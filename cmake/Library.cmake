@@ -1,7 +1,7 @@
-# What is installed for programs that verify packages themselves (examples/): the library that holds
-# all of the tool's code, the headers of the verification, and what CMake's find_package and
-# pkg-config ask for. The folder include/apktoolkit has the layout of the sources, so that a header
-# finds the others under the names that it includes them by.
+# Installs the files for programs that verify packages themselves (examples/): the library with all
+# of the tool's code, the headers of the verification, and the files for CMake's find_package and
+# for pkg-config. The directory include/apktoolkit has the layout of the sources, so that each
+# header finds the others under the names that it includes.
 if(APKTOOLKIT_ZIPSTRING)
   return()  # built against a library of the tests
 endif()
@@ -10,9 +10,11 @@ include(CMakePackageConfigHelpers)
 set(APKTOOLKIT_HEADER_DIR ${CMAKE_INSTALL_INCLUDEDIR}/apktoolkit)
 set(APKTOOLKIT_CONFIG_DIR ${CMAKE_INSTALL_LIBDIR}/cmake/apktoolkit)
 
-install(DIRECTORY apk crypto util DESTINATION ${APKTOOLKIT_HEADER_DIR}
+install(DIRECTORY apk crypto library util DESTINATION ${APKTOOLKIT_HEADER_DIR}
   FILES_MATCHING PATTERN "*.h")
-install(TARGETS apktoolkit_core EXPORT apktoolkit INCLUDES DESTINATION ${APKTOOLKIT_HEADER_DIR})
+install(TARGETS apktoolkit_core apktoolkit_verification EXPORT apktoolkit
+  INCLUDES DESTINATION ${APKTOOLKIT_HEADER_DIR})
+set_target_properties(apktoolkit_verification PROPERTIES EXPORT_NAME verification)
 set_target_properties(apktoolkit_core PROPERTIES EXPORT_NAME core)
 target_compile_features(apktoolkit_core PUBLIC cxx_std_17)
 
@@ -27,7 +29,8 @@ install(FILES ${PROJECT_BINARY_DIR}/apktoolkit-config.cmake
 
 cmake_path(RELATIVE_PATH CMAKE_INSTALL_PREFIX
   BASE_DIRECTORY ${CMAKE_INSTALL_FULL_LIBDIR}/pkgconfig OUTPUT_VARIABLE APKTOOLKIT_PC_PREFIX)
-# By their paths: the platform's libcrypto is not to be found in the place of another.
+# The platform's libraries are named by their paths, so that no other libcrypto is found in their
+# place.
 list(TRANSFORM PLATFORM_LIBRARIES REPLACE "(.+)" "\${platformdir}/lib\\1.so"
   OUTPUT_VARIABLE APKTOOLKIT_PC_LIBRARIES)
 list(JOIN APKTOOLKIT_PC_LIBRARIES " " APKTOOLKIT_PC_LIBRARIES)

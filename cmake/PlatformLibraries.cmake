@@ -1,9 +1,9 @@
 # The platform's own libraries, as Debian builds them for a workstation: headers under
-# /usr/include/android, libraries in the multiarch folder's `android/`. Their headers are system
-# headers (the `cfi` attribute warnings in them are not ours to mend), and their `libcrypto` is the
-# platform's, not the host's, so its folder comes first.
+# /usr/include/android, libraries in `android/` of the multiarch directory. The headers are system
+# headers: the project cannot fix their `cfi` attribute warnings. Their `libcrypto` is the
+# platform's, not the host's, so their directory comes first.
 set(PLATFORM_INCLUDE_DIR ${CMAKE_SYSROOT}/usr/include/android CACHE STRING
-  "Headers of the platform libraries: one folder, or a list of them")
+  "Headers of the platform libraries: one directory, or a list of them")
 set(PLATFORM_LIBRARY_DIR ${CMAKE_SYSROOT}/usr/lib/${CMAKE_LIBRARY_ARCHITECTURE}/android CACHE PATH
   "Platform libraries")
 

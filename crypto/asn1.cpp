@@ -8,7 +8,7 @@ namespace {
 constexpr uint32_t kLongFormTag = 31;
 constexpr uint32_t kMaxLengthOctets = 4;
 
-// Octets read one after the other.
+// Octets that are read one by one.
 struct Octets {
   const uint8_t* position;
   size_t left;
@@ -38,7 +38,7 @@ int asn1_get_next_bounded(const uint8_t* buf, size_t available, size_t bound, as
   if (!ReadIdentifier(&octets, hdr) || !ReadLength(&octets, hdr)) return -1;
 
   const size_t header_length = readable - octets.left;
-  // Deliberate: lengths are 32 bits wide here, and so is what remains.
+  // Deliberate: lengths have 32 bits here, and so does the remaining length.
   const auto remaining = static_cast<uint32_t>(bound - header_length);
   if (hdr->length > remaining) return -1;
   hdr->payload = octets.position;
@@ -57,7 +57,7 @@ int asn1_parse_oid(const uint8_t* buf, size_t len, asn1_oid* oid) {
       oid->oid[oid->len++] = static_cast<uint32_t>(first);
       value -= first * 40;
     }
-    // Deliberate: an arc that is too large for the record loses its high bits.
+    // Deliberate: an arc that does not fit in the record loses its high bits.
     oid->oid[oid->len++] = static_cast<uint32_t>(value);
   }
   return 0;
@@ -79,14 +79,14 @@ void asn1_oid_to_str(const asn1_oid* oid, char* buf, size_t size) {
   size_t used = 0;
   for (size_t i = 0; i < oid->len; ++i) {
     const int length = snprintf(buf + used, size - used, "%s%u", i == 0 ? "" : ".", oid->oid[i]);
-    // That it is negative no test can bring about: nothing in this format can fail.
+    // No test can make `length` negative: nothing in this format can fail.
     if (length < 0 || static_cast<size_t>(length) >= size - used) break;
     used += static_cast<size_t>(length);
   }
   buf[size - 1] = '\0';
 }
 
-// Deliberate: the count of unused bits is not looked at, so that they count as bits of the string.
+// Deliberate: the count of unused bits is ignored, so those bits count as bits of the string.
 uint64_t asn1_bit_string_to_long(const uint8_t* buf, size_t len) {
   constexpr size_t kMaxOctets = 5;  // the count of unused bits, and 32 bits
   uint64_t value = 0;
@@ -107,7 +107,7 @@ bool ReadIdentifier(Octets* octets, asn1_hdr* hdr) {
   hdr->tag = hdr->identifier & 0x1f;
   if (hdr->tag != kLongFormTag) return true;
 
-  // Deliberate: the number may have any number of octets, and keeps its low 32 bits.
+  // Deliberate: the tag number may have any number of octets. Its low 32 bits are kept.
   hdr->tag = 0;
   uint8_t octet;
   do {
@@ -124,9 +124,9 @@ bool ReadLength(Octets* octets, asn1_hdr* hdr) {
     hdr->length = octet;
     return true;
   }
-  // 0xFF, reserved, has too large a count as well. Deliberate: there may be more octets than DER
-  // asks for; and the indefinite form, which has a count of 0, reads as no contents, without a look
-  // for the element's end.
+  // 0xFF, which is reserved, fails because its count is too large. Deliberate: there may be more
+  // octets than DER allows. The indefinite form, whose count is 0, reads as empty contents; nobody
+  // looks for the end of its element.
   const uint32_t count = octet & 0x7f;
   if (count > kMaxLengthOctets) return false;
   for (uint32_t i = 0; i < count; ++i) {
@@ -136,7 +136,7 @@ bool ReadLength(Octets* octets, asn1_hdr* hdr) {
   return true;
 }
 
-// One value in base 128, most significant digit first; keeps the low 64 bits.
+// Reads one value in base 128, most significant digit first. Keeps its low 64 bits.
 bool ReadArc(Octets* octets, uint64_t* value) {
   uint8_t octet;
   do {

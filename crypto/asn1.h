@@ -1,6 +1,6 @@
-// Reading DER, and the BER that comes close to it, one header at a time (X.690 §8.1): what a value
-// means is left to the caller. No allocation, no logging; records point into the caller's bytes,
-// which must outlive them. Every function that can fail returns 0, or -1 for a failure.
+// Reads DER, and BER that is close to it, one header at a time (X.690 §8.1). The caller interprets
+// the values. The functions neither allocate nor log. Records point into the caller's bytes, which
+// must outlive them. Every function that can fail returns 0 for success and -1 for failure.
 #pragma once
 
 #include <cstddef>
@@ -40,35 +40,35 @@ struct asn1_oid {
 };
 
 // Reads the header at the start of the `len` bytes at `buf` into `hdr`. The element must end within
-// those bytes. Identifier and length octets need not be minimal; of a long tag number the low 32
-// bits are kept; the indefinite form reads as length 0. More than four length octets, and the
-// reserved first length octet 0xFF, fail.
+// those bytes. Identifier and length octets need not be minimal. A long tag number keeps its low 32
+// bits. The indefinite form reads as length 0. More than four length octets fail, and so does the
+// reserved first length octet 0xFF.
 //
-// After a failure `hdr` holds what was decoded before it, with a null payload.
+// After a failure, `hdr` holds the fields that were decoded before it, and its payload is null.
 int asn1_get_next(const uint8_t* buf, size_t len, asn1_hdr* hdr);
 
-// The same, for callers that trust an outer length: the element's length is compared with what
-// `bound` bytes at `buf` would leave for it, though no more than `available` of them can be read.
-// The header's own octets must lie within both. The contents may end beyond `available`, and it is
-// for the caller to look no further than there.
+// The same, for callers that trust an outer length: the element must end within `bound` bytes at
+// `buf`, although only `available` of them can be read. The header's own octets must lie within
+// both. The contents may end beyond `available`; the caller must not read further than that.
 int asn1_get_next_bounded(const uint8_t* buf, size_t available, size_t bound, asn1_hdr* hdr);
 
 // Decodes the contents of an OBJECT IDENTIFIER (X.690 §8.19), `len` bytes at `buf`; no bytes give
-// no arcs. Of each arc the low 32 bits are kept. Contents that end within an arc, and a 21st arc,
-// fail, and leave the arcs before them in `oid`.
+// no arcs. Each arc keeps its low 32 bits. Contents that end within an arc fail, and so does a 21st
+// arc; `oid` then holds the arcs before the fault.
 int asn1_parse_oid(const uint8_t* buf, size_t len, asn1_oid* oid);
 
-// Reads a whole OBJECT IDENTIFIER element from the `len` bytes at `buf`. Once its header is read
-// and right, `next` receives the position after the element. Other elements fail, and empty
-// contents do.
+// Reads a whole OBJECT IDENTIFIER element from the `len` bytes at `buf`. Sets `next` to the
+// position after the element once its header is right. Fails for any other element, and for empty
+// contents.
 int asn1_get_oid(const uint8_t* buf, size_t len, asn1_oid* oid, const uint8_t** next);
 
-// Writes the arcs as dotted text into the `size` bytes at `buf`: cut where it does not fit, always
-// NUL-terminated, nothing at all when `size` is 0. The tool itself prints no object identifier:
-// this is for the diagnostics of programs that read certificates with this library, and for tests.
+// Writes the arcs as dotted text into the `size` bytes at `buf`. The text is cut to fit and ends
+// with a NUL; a `size` of 0 writes nothing. The tool itself prints no object identifier: this
+// function is for tests, and for the diagnostics of programs that read certificates with this
+// library.
 void asn1_oid_to_str(const asn1_oid* oid, char* buf, size_t size);
 
-// The named bits of a BIT STRING (X.690 §8.6) as an integer: `buf` holds the contents, the count of
-// unused bits first, which is ignored. Named bit n becomes bit n of the result; bits from the 32nd
-// on are dropped. Contents of less than two bytes give 0.
+// The named bits of a BIT STRING (X.690 §8.6) as an integer. `buf` holds the contents. Their first
+// byte is the count of unused bits, which is ignored. Named bit n becomes bit n of the result; bits
+// 32 and above are dropped. Contents of fewer than two bytes give 0.
 uint64_t asn1_bit_string_to_long(const uint8_t* buf, size_t len);

@@ -9,11 +9,10 @@
 
 #include "crypto/wrapping.h"
 
-// Deliberate: limbs have 32 bits, and no sum or product of limbs has more, on 64-bit processors
-// too: there is one way to compute, in half limbs, and it needs no double-width type of the
-// compiler's. The object code for the device has no wider multiplication either (scripts/check
-// android looks for one). Elsewhere a compiler may use one for a vector of half limbs, as gcc does
-// for x86-64.
+// Deliberate: limbs have 32 bits, and no sum or product of limbs has more, even on 64-bit
+// processors. There is one way to compute, in half limbs, and it needs no double-width type of the
+// compiler. The device's object code has no wider multiplication either (scripts/check android
+// looks for one). Other compilers may use one for a vector of half limbs, as gcc does for x86-64.
 
 namespace {
 
@@ -198,8 +197,7 @@ int mpi_mod_mpi(mpi* R, const mpi* A, const mpi* B) {
   if (mpi_compare_abs(&X, B) >= 0) {
     if (const int result = reduce(&X, B)) return result;
   }
-  // The magnitude is below the divisor's now, so one addition lifts a negative remainder above
-  // zero.
+  // The magnitude is now below the divisor's, so one addition makes a negative remainder positive.
   if (sign_of(&X) < 0) {
     if (const int result = mpi_sub_abs(&X, B, &X)) return result;
   }
@@ -217,14 +215,14 @@ WRAPS_ON_PURPOSE void mpi_montmul(mpi* A, const mpi* B, const mpi* N, unsigned i
     const uint32_t u1 = (d[0] + u0 * B->p[0]) * mm;
     mpi_mul_hlp(m, B->p, d, u0);
     mpi_mul_hlp(n, N->p, d, u1);
-    // The two rows made this limb zero, so that it can hold another value.
+    // The two rows made this limb zero, so it can store another value.
     *d++ = u0;
   }
   for (int i = 0; i <= n; ++i) A->p[i] = d[i];
 
-  // Deliberate: a product below N is subtracted all the same, from scratch limbs that nobody reads,
-  // so that the time taken does not tell which of the two it was. T holds that product above its
-  // lowest n limbs, hence is no less than it and absorbs the borrow.
+  // Deliberate: N is always subtracted, so that the time does not depend on the product. If the
+  // product is below N, scratch limbs that nobody reads take the subtraction. T holds the product
+  // above its lowest n limbs, so T is not less than the product and absorbs the borrow.
   if (mpi_compare_abs(A, N) >= 0) {
     subtract_with_borrow(n, N->p, A->p);
   } else {
@@ -234,11 +232,12 @@ WRAPS_ON_PURPOSE void mpi_montmul(mpi* A, const mpi* B, const mpi* N, unsigned i
 
 namespace {
 
-// Wipes and frees what X owns; X itself is left pointing at it.
+// Wipes and frees the limbs of X. X still points at them afterwards.
 void release_limbs(mpi* X) {
   clear_limbs(X);
-  // A compiler may drop a store to memory that is freed; it must take these zeros for read. No test
-  // can tell, as gcc 12 and clang 14 keep them anyway.
+  // A compiler may drop a store to memory that is about to be freed. The empty assembly counts as a
+  // read of these zeros and keeps them. No test can tell, because gcc 12 and clang 14 keep them
+  // anyway.
   __asm__ __volatile__("" : : "r"(X->p) : "memory");
   free(X->p);
 }
@@ -290,15 +289,15 @@ WRAPS_ON_PURPOSE uint32_t subtract_limbs(int count, const uint32_t* s, uint32_t*
   return borrow;
 }
 
-// The same, and takes the borrow from the limbs of d above, one of which absorbs it.
+// The same, but takes the borrow from the higher limbs of d, one of which must absorb it.
 WRAPS_ON_PURPOSE void subtract_with_borrow(int count, const uint32_t* s, uint32_t* d) {
   uint32_t borrow = subtract_limbs(count, s, d);
   for (int i = count; borrow != 0; ++i) borrow = d[i]-- == 0;
 }
 
-// Adds s * b + c to d over `kCount` limbs; returns the carry. A vector holds a limb in each of its
-// lanes, and the four half products of all of them are made at once. They are then put together so
-// that no sum wraps: (2^16 - 1)^2, the greatest half product, leaves room for a half limb more.
+// Adds s * b + c to d over `kCount` limbs; returns the carry. A vector holds one limb in each lane,
+// so each of the four half products is computed for all lanes at once. They are put together so
+// that no sum wraps: (2^16 - 1)^2, the greatest half product, leaves room for another half limb.
 template <int kCount>
 WRAPS_ON_PURPOSE uint32_t multiply_add(const uint32_t* s, uint32_t* d, uint32_t b, uint32_t c) {
   constexpr int kLanes = std::min(kCount, 4);
@@ -331,13 +330,13 @@ WRAPS_ON_PURPOSE uint32_t multiply_add(const uint32_t* s, uint32_t* d, uint32_t 
 }
 
 // X = abs(X) mod abs(B) with the sign of X, for abs(X) >= abs(B) > 0. Long division by 32-bit
-// digits that leaves the remainder in place of the dividend; the quotient is not kept (Knuth, The
-// Art of Computer Programming, volume 2, 4.3.1, algorithm D).
+// digits leaves the remainder in place of the dividend and drops the quotient (Knuth, The Art of
+// Computer Programming, volume 2, 4.3.1, algorithm D).
 WRAPS_ON_PURPOSE int reduce(mpi* X, const mpi* B) {
   mpi_local Y;
   mpi_local product;
   if (const int result = mpi_assign(&Y, B)) return result;
-  // The estimate of a digit is close, and never too small, when the divisor's highest bit is set.
+  // If the divisor's highest bit is set, the estimate of a digit is close and never too small.
   const int shift = (kMpiLimbBits - mpi_msb(&Y) % kMpiLimbBits) % kMpiLimbBits;
   if (const int result = mpi_shift_l(&Y, shift)) return result;
   if (const int result = mpi_shift_l(X, shift)) return result;
@@ -371,7 +370,7 @@ uint32_t quotient_digit(const mpi* X, int i, const mpi* Y, int t) {
   }
 }
 
-// The quotient of the two limbs by d, whose highest bit is set, as far as it fits in a limb.
+// The quotient of the two limbs by d, whose highest bit is set. At most UINT32_MAX is returned.
 uint32_t estimate_digit(uint32_t high, uint32_t low, uint32_t d) {
   if (high >= d) return UINT32_MAX;
   uint32_t rest = high;
@@ -380,7 +379,7 @@ uint32_t estimate_digit(uint32_t high, uint32_t low, uint32_t d) {
   return (q1 << 16) | q0;
 }
 
-// Divides `rest`, which is below d, with the half limb `next` appended, by d. Returns the quotient
+// Appends the half limb `next` to `rest`, which is below d, and divides by d. Returns the quotient
 // and leaves the remainder in `rest`.
 WRAPS_ON_PURPOSE uint32_t half_digit(uint32_t* rest, uint32_t next, uint32_t d) {
   const uint32_t d1 = d >> 16;

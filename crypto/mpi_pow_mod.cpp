@@ -1,19 +1,19 @@
-// The power of a number modulo another, by Montgomery products and a sliding window.
+// Modular exponentiation, by Montgomery products and a sliding window.
 #include "crypto/mpi.h"
 #include "crypto/wrapping.h"
 
 namespace {
 
-// The window table of an exponentiation; its index has up to 6 bits.
+// The size of an exponentiation's window table; its index has up to 6 bits.
 constexpr int kWindowTableSize = 64;
 
-// What the Montgomery products of one exponentiation share.
+// The values that all Montgomery products of one exponentiation share.
 struct montgomery {
   const mpi* N;
   uint32_t mm;
   mpi_local T;
 
-  // X = A, with room for a product in its place.
+  // X = A, with enough limbs for a product to replace it.
   int copy(mpi* X, const mpi* A) const;
   void multiply(mpi* A, const mpi* B) { mpi_montmul(A, B, N, mm, &T); }
 };
@@ -35,8 +35,8 @@ int mpi_pow_mod(mpi* X, const mpi* A, const mpi* E, const mpi* N) {
   if (const int result = mpi_grow(&m.T, 2 * (N->n + 1))) return result;
   if (const int result = mpi_grow(&one, 1)) return result;
   one.p[0] = 1;
-  // A product with R^2 mod N, R = 2^(32 * N.n), takes a number into Montgomery form, one with 1
-  // takes it out again.
+  // A product with R^2 mod N, R = 2^(32 * N.n), takes a number into Montgomery form. A product with
+  // 1 takes it out again.
   if (const int result = mpi_assign(&RR, &one)) return result;
   if (const int result = mpi_shift_l(&RR, 2 * kMpiLimbBits * N->n)) return result;
   if (const int result = mpi_mod_mpi(&RR, &RR, N)) return result;
@@ -65,14 +65,14 @@ WRAPS_ON_PURPOSE uint32_t montgomery_constant(uint32_t m0) {
   return 0 - x;
 }
 
-// How many bits of an exponent of `bits` bits one product takes in. Deliberate: there is no window
-// of 2; exponents as short as that have few set bits in practice, and it would gain nothing.
+// The window size: the number of exponent bits for one product, for an exponent of `bits` bits.
+// Deliberate: no window has 2 bits. Short exponents have few set bits in practice: 2 gain nothing.
 int window_size(int bits) {
   return bits > 671 ? 6 : bits > 239 ? 5 : bits > 79 ? 4 : bits > 23 ? 3 : 1;
 }
 
-// From W[1] makes the powers W[i] = W[1]^i whose index has w bits, highest bit set: a window begins
-// with a set bit, so no other is ever needed. For a w of 1 there are no more than W[1].
+// Computes the powers W[i] = W[1]^i for each index i of w bits whose highest bit is set. A window
+// begins with a set bit, so no other power is ever needed. For w = 1 that is W[1] alone.
 int fill_window(mpi_local* W, int w, montgomery* m) {
   const int j = 1 << (w - 1);
   if (const int result = m->copy(&W[j], &W[1])) return result;
@@ -84,7 +84,7 @@ int fill_window(mpi_local* W, int w, montgomery* m) {
   return 0;
 }
 
-// Makes W[1]^E of X, which is 1 in Montgomery form, by a sliding window of w bits.
+// Computes W[1]^E in X, by a sliding window of w bits. X is 1 in Montgomery form before the call.
 void raise(mpi* X, const mpi* E, const mpi_local* W, int w, montgomery* m) {
   int nbits = 0;
   int wbits = 0;
@@ -102,7 +102,7 @@ void raise(mpi* X, const mpi* E, const mpi_local* W, int w, montgomery* m) {
     nbits = 0;
     wbits = 0;
   }
-  // A window that the exponent's end cut short.
+  // The last window, which may have fewer than w bits.
   for (; nbits > 0; --nbits) {
     m->multiply(X, X);
     wbits <<= 1;

@@ -12,18 +12,18 @@
 
 namespace {
 
-// The block, and places in it: offsets from its start, which may lie beyond its end.
+// The block, and positions in it: offsets from its start, which may lie beyond its end.
 struct Block {
   const uint8_t* bytes;
   size_t length;
 
-  // Reads the header at `offset`. The header itself must lie within the block; the element's length
-  // is compared with what `bound` bytes from `offset` on would leave for it.
+  // Reads the header at `offset`. The header itself must lie within the block. The element must end
+  // within `bound` bytes from `offset`.
   bool Read(size_t offset, size_t bound, asn1_hdr* hdr) const;
-  // Reads the header at `offset` of an element that ends at `end`, which lies in the block, or
-  // before.
+  // Reads the header at `offset` of an element that must end at or before `end`, which lies in the
+  // block.
   bool ReadInside(size_t offset, size_t end, asn1_hdr* hdr) const;
-  // Where an element's contents start, and where they end.
+  // The offsets where an element's contents start, and where they end.
   size_t Enter(const asn1_hdr& hdr) const { return static_cast<size_t>(hdr.payload - bytes); }
   size_t Skip(const asn1_hdr& hdr) const { return Enter(hdr) + hdr.length; }
 };
@@ -37,7 +37,7 @@ void StoreExponent(const asn1_hdr& exponent, pkcs7* record);
 bool ReadSigner(const Block& block, const asn1_hdr& certificates, pkcs7* record);
 bool ReadDigestAlgorithm(const Block& block, size_t offset, size_t end, asn1_hdr* algorithm);
 
-// Tells of a failure on a line of its own; returns false.
+// Prints the failure on a line of its own. Returns false.
 bool Fail(const char* format, ...) __attribute__((format(printf, 1, 2)));
 
 constexpr char kUnreadable[] = "PUBLIC KEY ERROR: reading asn1 tag fail";
@@ -55,7 +55,7 @@ bool ReadBlock(const Block& block, pkcs7* record) {
   asn1_hdr certificates;
   x509_certificate certificate;
   if (!ReadHeaders(block, &certificates)) return Fail("processPKCS7Header() error");
-  // Deliberate: a certificate that does not parse has one line, and none for the step.
+  // Deliberate: if the certificate does not parse, one line is printed, and none for the step.
   if (!ReadCertificate(block, certificates, &certificate, record)) return false;
   if (!ReadPublicKey(block, certificate, record)) return Fail("processPublicKey() error");
   return ReadSigner(block, certificates, record) || Fail("processSignHeader() error");
@@ -71,9 +71,9 @@ bool Block::ReadInside(size_t offset, size_t end, asn1_hdr* hdr) const {
   return offset <= end && asn1_get_next(bytes + offset, end - offset, hdr) == 0;
 }
 
-// Goes from the start of the block to the [0] of its certificates, whose header it leaves in `hdr`.
-// Deliberate: no label is looked at, and each length is compared with the whole block's, from
-// wherever the element is.
+// Goes from the start of the block to the [0] of its certificates and leaves that header in `hdr`.
+// Deliberate: no label is checked. Each length is compared with the whole block's length, counted
+// from the element itself.
 WRAPS_ON_PURPOSE bool ReadHeaders(const Block& block, asn1_hdr* hdr) {
   if (!block.Read(0, block.length, hdr) || !block.Read(block.Enter(*hdr), block.length, hdr)) {
     return Fail("CANT PROCESS CERTIFICATE TAG");
@@ -87,15 +87,15 @@ WRAPS_ON_PURPOSE bool ReadHeaders(const Block& block, asn1_hdr* hdr) {
       block.Read(block.Skip(*hdr), block.length, hdr)) {   // the [0] of the certificates
     return true;
   }
-  // Deliberate: a header that could not be read has no place, so the offset printed is the distance
-  // from the block to the null address.
+  // Deliberate: an unreadable header has a null payload. The offset printed is the distance from
+  // the block to the null address.
   const uintptr_t offset =
       reinterpret_cast<uintptr_t>(hdr->payload) - reinterpret_cast<uintptr_t>(block.bytes);
   return Fail("CANT PROCESS CERTIFICATE TAG = %d, offset = %p", static_cast<int>(hdr->tag),
               reinterpret_cast<void*>(offset));
 }
 
-// Deliberate: of several certificates the first is the signer's, whoever the signer names.
+// Deliberate: of several certificates the first is taken, even if the signer names another one.
 bool ReadCertificate(const Block& block, const asn1_hdr& certificates,
                      x509_certificate* certificate, pkcs7* record) {
   const size_t available = block.length - block.Enter(certificates);
@@ -110,7 +110,7 @@ bool ReadCertificate(const Block& block, const asn1_hdr& certificates,
   return true;
 }
 
-// The RSAPublicKey (RFC 8017 §A.1.1). Deliberate: of its labels the numbers count, not the classes.
+// The RSAPublicKey (RFC 8017 §A.1.1). Deliberate: only tag numbers are checked, not their classes.
 bool ReadPublicKey(const Block& block, const x509_certificate& certificate, pkcs7* record) {
   asn1_hdr hdr;
   if (asn1_get_next(certificate.public_key, certificate.public_key_length, &hdr) != 0) {
@@ -125,8 +125,8 @@ bool ReadPublicKey(const Block& block, const x509_certificate& certificate, pkcs
   record->modulus = modulus.payload + zeros;
   record->modulus_length = modulus.length - zeros;
 
-  // Deliberate: the exponent's length is compared with the modulus's, not with what remains of the
-  // key. Its contents must lie within the block, since they are copied.
+  // Deliberate: the exponent's length is compared with the modulus's, not with the rest of the key.
+  // The exponent is copied, so its contents must lie within the block.
   asn1_hdr exponent;
   if (!block.Read(block.Skip(modulus), modulus.length, &exponent)) return Fail(kUnreadable);
   if (exponent.tag != kAsn1Integer) return Fail(kNotAnInteger);
@@ -135,9 +135,9 @@ bool ReadPublicKey(const Block& block, const x509_certificate& certificate, pkcs
   return true;
 }
 
-// Deliberate: an exponent of more than four bytes runs on into the modulus length, which follows it
-// in the record, and what finds no room there is dropped. Exponents that are met have three bytes
-// at most; whoever writes a longer one states the modulus length, too.
+// Deliberate: an exponent of more than four bytes overwrites the modulus length, which follows it
+// in the record. Bytes beyond that are dropped. Exponents in use have at most three bytes; the
+// maker of a longer one thereby states the modulus length, too.
 void StoreExponent(const asn1_hdr& exponent, pkcs7* record) {
   constexpr size_t kStart = offsetof(pkcs7, exponent);
   constexpr size_t kEnd = offsetof(pkcs7, modulus_length) + sizeof(record->modulus_length);
@@ -148,8 +148,8 @@ void StoreExponent(const asn1_hdr& exponent, pkcs7* record) {
          std::min<size_t>(exponent.length, kEnd - kStart));
 }
 
-// The first SignerInfo (RFC 2315 §9.2), of the signerInfos that follow the certificates.
-// Deliberate: what is printed of it speaks of the public key, as the lines above do.
+// The first SignerInfo (RFC 2315 §9.2) of the signerInfos, which follow the certificates.
+// Deliberate: its failures print "PUBLIC KEY ERROR", like those of the public key.
 bool ReadSigner(const Block& block, const asn1_hdr& certificates, pkcs7* record) {
   asn1_hdr signers, signer, version, issuer;
   if (!block.ReadInside(block.Skip(certificates), block.length, &signers) ||
@@ -163,10 +163,10 @@ bool ReadSigner(const Block& block, const asn1_hdr& certificates, pkcs7* record)
     return Fail("PUBLIC KEY ERROR: parse algorithm identifier");
   }
 
-  // Deliberate: the elements are taken by position, without looking at their labels. A signer with
-  // authenticated attributes thus gives its digestEncryptionAlgorithm for the digest, which
-  // verifies nothing: the signature has to cover the signature file itself. The lengths are
-  // compared with the distance from the start of the block to the end of the digestAlgorithm.
+  // Deliberate: the elements are taken by position, and their labels are not checked. If a signer
+  // has authenticated attributes, its digestEncryptionAlgorithm is taken for the digest and does
+  // not verify: the signature must cover the signature file itself. The lengths are compared with
+  // the distance from the start of the block to the end of the digestAlgorithm.
   const size_t bound = block.Skip(algorithm);
   asn1_hdr encryption, digest;
   if (!block.Read(bound, bound, &encryption) ||
@@ -178,8 +178,8 @@ bool ReadSigner(const Block& block, const asn1_hdr& certificates, pkcs7* record)
   return true;
 }
 
-// The AlgorithmIdentifier at `offset`, which must end at `end` or before. Which digest it names
-// does not matter: the signature itself says that.
+// The AlgorithmIdentifier at `offset`, which must end at `end` or before. The digest that it names
+// does not matter: the signature itself names its digest.
 bool ReadDigestAlgorithm(const Block& block, size_t offset, size_t end, asn1_hdr* algorithm) {
   asn1_oid oid;
   const uint8_t* next;

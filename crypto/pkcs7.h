@@ -1,7 +1,7 @@
-// The signature block of a signed JAR (the `.RSA` entry): what the two RSA checks need from its
-// PKCS#7 SignedData (RFC 2315 §9). The block is walked by position, and few labels are looked at.
-// No allocation; the record points into the caller's block, which must outlive it. Failures are
-// told on standard output, one or two lines "CERT_PARCER [ERROR]: ..." each, and not in the log.
+// Reads the values for the two RSA checks from the signature block of a signed JAR (the `.RSA`
+// entry), a PKCS#7 SignedData (RFC 2315 §9). Walks the block by position and checks few labels.
+// No allocation; the record points into the caller's block, which must outlive it. A failure
+// prints one or two lines "CERT_PARCER [ERROR]: ..." on standard output and logs nothing.
 #pragma once
 
 #include <cstdint>
@@ -19,11 +19,11 @@ struct pkcs7 {
   uint32_t modulus_length;
 };
 
-// Reads the `length` bytes at `block` into `record`, which the caller has cleared. Of several
-// certificates and signers the first is taken, and the certificate is not matched with the signer.
-// Returns 0, or 1 for a failure, which leaves in `record` what was stored before it.
+// Reads the `length` bytes at `block` into `record`, which the caller has cleared. Takes the first
+// certificate and the first signer, and does not match one with the other. Returns 0 for success
+// and 1 for failure; `record` then keeps the fields that were stored before it.
 //
-// The block is trusted to be well formed: outer lengths are not compared with what holds them, so
-// `modulus_length` bytes at `modulus`, and `signed_digest_length` bytes at `signed_digest`, may end
-// beyond the block, and it is for the caller to compare. The other two always lie in the block.
+// The block is trusted to be well formed: outer lengths are not compared with the element around
+// them. The `modulus_length` bytes at `modulus` and the `signed_digest_length` bytes at
+// `signed_digest` may end beyond the block: the caller must check. The other two lie in the block.
 int processCert(const uint8_t* block, uint32_t length, pkcs7* record);

@@ -1,8 +1,8 @@
 // RSA PKCS#1 v1.5 signature verification (RFC 8017 §8.2.2) on the tool's own integers.
 //
 // A context owns the limbs of its two numbers; an rsa_local releases them. Bytes that are passed in
-// are only read during the call. A signature whose digest does not match, or whose digest cannot be
-// told, is logged at error priority; every other refusal is silent.
+// are only read during the call. A signature is logged at error priority if its digest does not
+// match or its DigestInfo names no known digest. Every other refusal is silent.
 #pragma once
 
 #include <cstdint>
@@ -20,44 +20,44 @@ inline void mpi_apply(void (*call)(mpi* X, ...), rsa_context* ctx) {
   call(&ctx->N, &ctx->E, nullptr);
 }
 
-// A context that is empty at first and released when its scope ends.
+// A context that starts empty and is released when its scope ends.
 using rsa_local = mpi_owner<rsa_context>;
 
 // The bounds of a modulus that verifies, in bytes.
 inline constexpr uint32_t kRsaMinModulusSize = 16;
 inline constexpr uint32_t kRsaMaxModulusSize = 512;
 
-// True if anyone can make the signatures of a key with this exponent. The caller refuses such keys.
-// Deliberate: of all exponents this one is judged, the sign being of no account (mpi_pow_mod). A
-// number to the power of 1 is itself, so that everyone could write down signatures for any key
-// (docs/decisions/exponent-of-one.md).
+// True if anyone can forge signatures for a key with this exponent. The caller refuses these keys.
+// Deliberate: only this exponent is refused, with either sign, since the sign does not count
+// (mpi_pow_mod). A number to the power of 1 is itself, so anyone could write down a signature for
+// any key (docs/decisions/exponent-of-one.md).
 constexpr bool rsa_is_forgeable(uint32_t exponent_value) {
   return exponent_value == 1 || exponent_value == UINT32_MAX;
 }
 
-// Results; 0 is success. The last two are flags on top of a code of the integers.
+// Results; 0 is success. The last two are flags, combined with a code of crypto/mpi.h.
 inline constexpr int kRsaBadInput = 5;
 inline constexpr int kRsaInvalidPadding = 7;
 inline constexpr int kRsaVerifyFailed = 18;
 inline constexpr int kRsaKeyFlag = 8;
 inline constexpr int kRsaPublicFlag = 16;
 
-// Loads a public key into `ctx`, which is not null and owns no limbs: what it held is not freed.
+// Loads a public key into `ctx`, which is not null. Limbs that `ctx` owned before are not freed.
 //
-// `modulus` is unsigned, big-endian, `len` bytes; null leaves the modulus empty. `exponent` is the
-// same, of the same length; when it is null, `exponent_value`, read as a signed number, is the
-// exponent. A `len` of 0 leaves both numbers empty and the context's `len` as it was. A context
-// with an empty modulus verifies nothing.
+// `modulus` is unsigned, big-endian, `len` bytes; null leaves the modulus empty. `exponent` has the
+// same form and length; if it is null, `exponent_value`, read as a signed number, is the exponent.
+// A `len` of 0 leaves both numbers empty and does not change the context's `len`. A context with an
+// empty modulus verifies nothing.
 //
 // Returns 0, or kRsaKeyFlag | kMpiNoMemory (9) with both numbers empty.
 int rsa_set_key(rsa_context* ctx, const uint8_t* modulus, const uint8_t* exponent,
                 uint32_t exponent_value, uint32_t len);
 
-// Checks `sig`, of the context's `len` bytes, big-endian, against the digests of the signed data;
-// the signature itself tells which of them it was made for. `sha1` (20 bytes) is required; `sha256`
-// (32 bytes) may be null, and then no SHA-256 signature verifies; `md5` (16 bytes) is not null.
+// Checks `sig`, of the context's `len` bytes, big-endian, against the digests of the signed data.
+// The signature itself names its digest. `sha1` (20 bytes) and `md5` (16 bytes) are not null.
+// `sha256` (32 bytes) may be null; then no SHA-256 signature verifies.
 //
-// Returns 0 when the signature carries the digest, and else
+// Returns 0 if the signature carries the digest, and otherwise
 //   kRsaBadInput (5)        null `ctx`, `sha1` or `sig`; `len` outside 16..512; signature not below
 //                           the modulus
 //   kRsaInvalidPadding (7)  not a block of type 1 (RFC 8017 §9.2), or of no known DigestInfo length

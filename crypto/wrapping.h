@@ -1,9 +1,9 @@
-// The mark of arithmetic that wraps on purpose.
+// Marks arithmetic that wraps on purpose.
 #pragma once
 
-// Says of a function that its unsigned sums and products are meant modulo 2^32 and that it looks
-// after the carries itself. scripts/check, which takes an unsigned overflow anywhere else for a
-// mistake, leaves the function alone; nothing else changes.
+// Declares that a function computes unsigned sums and products modulo 2^32 and handles the carries
+// itself. scripts/check takes an unsigned overflow in any other function for a mistake. The mark
+// has no other effect.
 #ifdef __clang__
 #define WRAPS_ON_PURPOSE __attribute__((no_sanitize("unsigned-integer-overflow")))
 #else

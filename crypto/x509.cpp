@@ -5,8 +5,7 @@
 
 namespace {
 
-// Bytes of the certificate that are still to be read. Deliberate: what is left of them when the
-// last element that is known has been read is not looked at.
+// The unread bytes of an element. Deliberate: bytes after the last known element are ignored.
 struct Range {
   const uint8_t* start;
   size_t length;
@@ -14,7 +13,7 @@ struct Range {
 
 Range Contents(const asn1_hdr& hdr) { return {hdr.payload, hdr.length}; }
 
-// What of `range` follows `position`, which lies in it.
+// The rest of `range` from `position` on, which lies in it.
 Range After(const Range& range, const uint8_t* position) {
   return {position, range.length - static_cast<size_t>(position - range.start)};
 }
@@ -51,8 +50,8 @@ uint32_t ToUint32(const asn1_hdr& integer) {
 bool HoldsNul(const asn1_hdr& hdr) { return memchr(hdr.payload, 0, hdr.length) != nullptr; }
 
 // The parts of a certificate, in order. ParseTbs, ParseVersionAndSerial, ParseOptionalFields and
-// ParseSignature return a code of x509_certificate_parse. All others return whether they succeeded,
-// as a bool, or as 0 and a negative number of their own, and their caller knows the code.
+// ParseSignature return a code of x509_certificate_parse. The others return true for success, or 0,
+// and false, or a negative number of their own, for failure. Their caller chooses the code.
 int ParseTbs(Range tbs, x509_certificate* cert);
 int ParseVersionAndSerial(Range* tbs, x509_certificate* cert);
 bool ParseAlgorithm(Range* range, asn1_oid* oid, asn1_oid* params);
@@ -141,15 +140,15 @@ int ParseTbs(Range tbs, x509_certificate* cert) {
 int ParseVersionAndSerial(Range* tbs, x509_certificate* cert) {
   asn1_hdr hdr;
   if (!Next(tbs, &hdr)) return -5;
-  // Deliberate: whatever its number, an element of the context-specific class is the version here.
+  // Deliberate: any element of the context-specific class is taken for the version here.
   if (hdr.class_ == kAsn1Context) {
     Range inner = Contents(hdr);
     const Range from_inner = {inner.start, inner.length + tbs->length};
     if (!Next(&inner, &hdr)) return -5;
     if (!IsUniversal(hdr, kAsn1Integer) || hdr.length != 1 || hdr.payload[0] > 2) return -9;
     cert->version = hdr.payload[0];
-    // Deliberate: the serialNumber is looked for right after the number, not after the element that
-    // holds the number.
+    // Deliberate: the serialNumber is expected right after the version's number, not after the
+    // element that holds the number.
     *tbs = After(from_inner, hdr.payload + hdr.length);
     if (!Next(tbs, &hdr)) return -5;
   }
@@ -171,7 +170,7 @@ bool ParseAlgorithm(Range* range, asn1_oid* oid, asn1_oid* params) {
 
 // A Name (RFC 5280 §4.1.2.4); `next` receives the position after it. Returns 0, or -3 for a missing
 // SEQUENCE, -7 for a missing SET, -8 for a missing attribute type, -1 for an attribute value that
-// is missing, holds a NUL or is one too many; each becomes -12. `name` is empty after a failure.
+// is missing, holds a NUL or is one too many. Each becomes -12. `name` is empty after a failure.
 int x509_parse_name(const uint8_t* buf, size_t len, x509_name* name, const uint8_t** next) {
   Range range = {buf, len};
   asn1_hdr hdr;
@@ -189,8 +188,8 @@ int x509_parse_name(const uint8_t* buf, size_t len, x509_name* name, const uint8
   return 0;
 }
 
-// Returns as x509_parse_name. Deliberate: of a RelativeDistinguishedName only the first attribute
-// is read.
+// Returns the codes of x509_parse_name. Deliberate: only the first attribute of a
+// RelativeDistinguishedName is read.
 int ParseRdn(Range set, x509_name* name) {
   asn1_hdr hdr;
   if (!NextUniversal(&set, kAsn1Sequence, &hdr)) return -3;
@@ -206,7 +205,7 @@ bool IsType(const asn1_oid& oid, const KnownAttribute& attribute) {
          memcmp(oid.oid, attribute.arcs, attribute.arc_count * sizeof(uint32_t)) == 0;
 }
 
-// Deliberate: of the values that are kept only the e-mail address may hold a NUL.
+// Deliberate: a kept value must not hold a NUL, except for the e-mail address.
 bool KeepAttribute(const asn1_oid& type, const asn1_hdr& value, x509_name* name) {
   if (IsType(type, kEmailAddress)) {
     name->email = value.payload;
@@ -241,8 +240,8 @@ int TwoDigits(const uint8_t* digits) {
 }
 
 // The two forms of RFC 5280 §4.1.2.5: UTC, with seconds and without fractions of them. Returns 0,
-// or -1 for any other. Deliberate: nobody reads the times, and no number is too large for its
-// field.
+// or -1 for any other form. Deliberate: nobody reads the times, so the range of the numbers is not
+// checked.
 int x509_parse_time(const uint8_t* value, size_t len, uint32_t tag, x509_parser_time* time) {
   constexpr size_t kAfterYear = sizeof("MMDDHHMMSSZ") - 1;
   const size_t year_digits = tag == kAsn1UtcTime ? 2 : 4;
@@ -283,12 +282,12 @@ bool ParsePublicKeyInfo(Range* tbs, x509_certificate* cert) {
 
 int ParseOptionalFields(Range tbs, x509_certificate* cert) {
   constexpr uint32_t kExtensionsTag = 3;
-  // Deliberate: a v1 certificate, which has no such fields, may have them, and they are not read.
+  // Deliberate: a v1 certificate should not have these fields. If it has them, they are not read.
   if (tbs.length == 0 || cert->version == 0) return 0;
   asn1_hdr hdr;
   if (!Next(&tbs, &hdr) || hdr.class_ != kAsn1Context) return -5;
-  // Deliberate: only the first of the optional fields is looked at, so that extensions which follow
-  // a unique identifier are not read.
+  // Deliberate: only the first of the optional fields is read. Extensions after a unique identifier
+  // are therefore ignored.
   if (hdr.tag != kExtensionsTag) return 0;
 
   Range field = Contents(hdr);
@@ -307,7 +306,7 @@ bool ParseExtension(Range extension, x509_certificate* cert) {
   bool critical;
   Range value;
   if (!NextOid(&extension, &id) || !ReadExtensionValue(extension, &critical, &value)) return false;
-  // Deliberate: arcs after the fourth make no difference.
+  // Deliberate: arcs after the fourth are ignored.
   const bool is_known = id.len >= 4 && id.oid[0] == 2 && id.oid[1] == 5 && id.oid[2] == 29;
   switch (is_known ? id.oid[3] : 0) {
     case 15:
@@ -323,7 +322,7 @@ bool ParseExtension(Range extension, x509_certificate* cert) {
   }
 }
 
-// Critical flag and value of an extension, which start `extension`.
+// Reads the critical flag and the value of an extension, at the start of `extension`.
 bool ReadExtensionValue(Range extension, bool* critical, Range* value) {
   *critical = false;
   const Range from_flag = extension;
@@ -333,8 +332,8 @@ bool ReadExtensionValue(Range extension, bool* critical, Range* value) {
     if (hdr.length != 1) return false;
     *critical = hdr.payload[0] != 0;
     // Deliberate: the next header starts at the flag's own byte. TRUE in DER, 0xFF, reads as the
-    // first octet of a long-form tag of the private class, whose number is then the octet that
-    // labels the OCTET STRING. FALSE, which DER leaves out, is refused when it is written.
+    // first octet of a long-form tag of the private class; the tag number is then the identifier
+    // octet of the OCTET STRING. A written FALSE, which DER leaves out, is refused.
     extension = After(from_flag, hdr.payload);
     if (!Next(&extension, &hdr)) return false;
     if (hdr.class_ != kAsn1Universal && hdr.class_ != kAsn1Private) return false;
@@ -379,7 +378,7 @@ bool ParseBasicConstraints(Range value, x509_certificate* cert) {
   return true;
 }
 
-// GeneralNames (RFC 5280 §4.2.1.6), without the SEQUENCE's header. Returns 0, or -1 when a header
+// GeneralNames (RFC 5280 §4.2.1.6), without the SEQUENCE's header. Returns 0, or -1 if a header
 // cannot be read, a text holds a NUL or a registeredID is malformed.
 int x509_parse_ext_alt_name(x509_name* name, const uint8_t* buf, size_t len) {
   Range names = {buf, len};
@@ -410,7 +409,7 @@ bool KeepAltName(const asn1_hdr& hdr, x509_name* name) {
   }
 }
 
-// A text with a NUL in it would read differently elsewhere: it is refused, and none is kept.
+// A text with a NUL would read differently elsewhere. It is refused, and none is kept.
 bool KeepText(const asn1_hdr& hdr, const uint8_t** text, uint64_t* length) {
   const bool good = !HoldsNul(hdr);
   *text = good ? hdr.payload : nullptr;

@@ -1,6 +1,6 @@
-// One X.509 certificate (RFC 5280 §4.1), read into a record that points into the caller's bytes.
-// Its structure is read and nothing more: dates, signatures and chains are for others to check. No
-// allocation, no logging; the caller's bytes must outlive the record.
+// Reads one X.509 certificate (RFC 5280 §4.1) into a record that points into the caller's bytes.
+// Only the structure is read; the caller checks dates, signatures and chains. No allocation, no
+// logging. The caller's bytes must outlive the record.
 #pragma once
 
 #include <cstddef>
@@ -8,13 +8,13 @@
 
 #include "crypto/asn1.h"
 
-// A UTCTime or GeneralizedTime as written, its numbers in no way checked; `year` has four digits.
+// A UTCTime or GeneralizedTime as written. The numbers are not checked; `year` has four digits.
 struct x509_parser_time {
   uint16_t year;
   uint8_t month, day, hour, minute, second;
 };
 
-// The attributes of a name that are kept, by x509_name_attribute::type.
+// The attributes of a name that are kept, as x509_name_attribute::type.
 enum : uint32_t {
   kX509DomainComponent = 1,
   kX509CommonName = 2,
@@ -34,8 +34,8 @@ struct x509_name_attribute {
 
 inline constexpr size_t kX509MaxAttributes = 20;
 
-// A distinguished name, with the alternative names that an extension gives for it. What the
-// certificate does not hold is null and 0; of several of a kind, the last one counts.
+// A distinguished name, with the alternative names that an extension gives for it. A missing part
+// is null and 0. Of several parts of one kind the last one counts.
 struct x509_name {
   x509_name_attribute attributes[kX509MaxAttributes];  // in order of appearance
   uint64_t attribute_count;
@@ -83,20 +83,20 @@ struct x509_certificate {
   uint64_t tbs_length;
 };
 
-// Reads the certificate at the start of the `len` bytes at `buf` into `cert`; what follows it is
-// not looked at. Returns 0, or
-//   -2   nothing given: `buf` or `cert` is null, or `len` 0
+// Reads the certificate at the start of the `len` bytes at `buf` into `cert`. Bytes after it are
+// ignored. Returns 0, or
+//   -2   `buf` or `cert` is null, or `len` is 0
 //   -3   the Certificate or the tbsCertificate is not a SEQUENCE
 //   -4   the signatureValue is not a BIT STRING
 //   -5   a header of the version, the serialNumber or the optional fields cannot be read, the
 //        optional fields are of another class than context-specific, or the signatureValue is empty
 //   -6   the signatureValue does not end with a whole byte
-//   -9   the version is none of v1, v2 and v3
+//   -9   the version is not v1, v2 or v3
 //   -10  the serialNumber is not an INTEGER
 //   -11  a signature's AlgorithmIdentifier is malformed
-//   -12  the issuer or the subject is
-//   -13  the validity is
-//   -14  the subjectPublicKeyInfo is
-//   -15  an extension is, or is critical and not understood, or stands in a v2 certificate
-// After a failure `cert`, if not null, holds what was read before it.
+//   -12  the issuer or the subject is malformed
+//   -13  the validity is malformed
+//   -14  the subjectPublicKeyInfo is malformed
+//   -15  an extension is malformed, is critical and unknown, or is in a v2 certificate
+// After a failure, `cert` keeps the fields that were read before it, unless it is null.
 int x509_certificate_parse(const uint8_t* buf, size_t len, x509_certificate* cert);

@@ -1,6 +1,6 @@
-// Says of a package whether its JAR signature is good, and whose it is: what a program looks like
-// that links the verification. Nothing is signed here; the reason of a refusal is in the Android
-// log, which the platform's log library writes to standard error on a workstation.
+// Tells whether a package's JAR signature is good, and who signed it. It shows what a program looks
+// like that links the verification. It signs nothing. Phones may install the package for another
+// signer than this one: README.md tells how to compare the two.
 #include <fcntl.h>
 #include <unistd.h>
 
@@ -8,7 +8,7 @@
 #include <cstdio>
 #include <vector>
 
-#include "apk/apk.h"
+#include "library/verification.h"
 #include "util/digest.h"
 
 namespace {
@@ -22,9 +22,23 @@ void PrintSigner(const ApkTools::Apk& apk) {
   printf("\n");
 }
 
+// The archive is released before the descriptor is closed.
+bool IsGood(const char* name, int fd) {
+  ApkTools::Verification verification(fd);
+  const ApkTools::Reason reason = verification.reason();
+  if (reason != ApkTools::Reason::kGood) {
+    printf("%s: refused: %s\n", name, ApkTools::TextOf(reason));
+    return false;
+  }
+  printf("%s: good\n", name);
+  PrintSigner(verification.apk());
+  return true;
+}
+
 }  // namespace
 
-// Ends with 0 for a good package, 1 for another file, 2 where there is nothing to look at.
+// Exit status: 0 a good package; 1 another file; 2 a wrong command line, or the file cannot be
+// opened.
 int main(int argc, char* argv[]) {
   if (argc != 2) {
     fprintf(stderr, "usage: verify FILE\n");
@@ -35,10 +49,7 @@ int main(int argc, char* argv[]) {
     perror(argv[1]);
     return 2;
   }
-  ApkTools::Apk apk(fd);
-  const bool good = apk.IsGoodApk();
-  printf("%s: %s\n", argv[1], good ? "good" : "not good");
-  if (good) PrintSigner(apk);
+  const bool good = IsGood(argv[1], fd);
   close(fd);
   return good ? 0 : 1;
 }

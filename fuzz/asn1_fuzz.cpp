@@ -8,7 +8,7 @@
 
 namespace {
 
-// Reads the elements of the range, one after the other, and those inside them.
+// Reads the elements of the range, one after the other, and the elements inside them.
 void WalkElements(const uint8_t* data, size_t size, int depth) {
   size_t position = 0;
   while (position < size) {
@@ -46,7 +46,7 @@ void ReadOid(const uint8_t* data, size_t size, size_t room) {
   CheckText(oid, room);
 }
 
-// Bit n of the value is the n-th bit of the string, for the first 32.
+// The n-th bit of the string becomes bit n of the value, for the first 32.
 void ReadBitString(const uint8_t* data, size_t size) {
   uint64_t expected = 0;
   for (size_t bit = 0; bit < 32 && 1 + bit / 8 < size; ++bit) {

@@ -1,4 +1,4 @@
-// apk/base64.h: any text, into any room, against a decoder that sorts the text first.
+// apk/base64.h: any text, into any room, against a decoder that filters the text first.
 #include "apk/base64.h"
 
 #include "fuzz/fuzz.h"

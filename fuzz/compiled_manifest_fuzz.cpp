@@ -1,6 +1,6 @@
-// apk/android_manifest.cpp: any bytes as the compiled Android manifest, put where memory ends, for
-// the platform's parser is not instrumented. A second reader converts every text to UTF-8 and then
-// compares it; both must find the same.
+// apk/android_manifest.cpp: any bytes as the compiled Android manifest. They are put where memory
+// ends, because the platform's parser is not instrumented. A second reader converts every text to
+// UTF-8 and then compares it. Both readers must find the same.
 #include <androidfw/ResourceTypes.h>
 #include <utils/String8.h>
 
@@ -20,8 +20,8 @@ struct Facts {
   bool asks = false;
 };
 
-// No text is longer than the one that it is compared with by more than so many units, or it is
-// another, whatever the conversion drops of it.
+// A text that is longer than the wanted one by more than this many units is a different text, even
+// if the conversion drops some of them.
 constexpr size_t kMostDropped = 16;
 
 bool Is(const char16_t* text, size_t length, const std::string& wanted) {
@@ -71,7 +71,7 @@ void ReadElement(const ResXMLParser& parser, Facts* facts) {
   }
 }
 
-// False if the document is one that this reader, which looks at every attribute, is too slow for.
+// Returns false if this reader, which reads every attribute, is too slow for the document.
 bool ReadByConversion(std::vector<uint8_t> bytes, Facts* facts) {
   const size_t size = bytes.size();
   bytes.resize(size + sizeof(android::ResXMLTree_attribute));

@@ -1,5 +1,5 @@
-// What the simulator reads of a file to explain what the tool made of it: each of its readers, and
-// all of them over a whole file. The first byte says which.
+// The simulator's own readers of a file, which explain the tool's result: each reader alone, and
+// all of them over a whole file. The first byte selects the reader.
 #include <sys/mman.h>
 #include <unistd.h>
 
@@ -23,7 +23,7 @@ bool IsPartOf(std::string_view part, std::string_view whole) {
          (part.data() >= whole.data() && part.data() + part.size() <= whole.data() + whole.size());
 }
 
-// A certificate that was read has digests; one that was not has none.
+// A certificate that was read has digests.
 void JudgeCertificate(std::string_view bytes) {
   const auto facts = ParseCertificate(bytes);
   ParseAlgorithm(bytes);
@@ -49,7 +49,7 @@ void JudgeSignatureBlock(std::string_view bytes) {
 void JudgeAndroidManifest(std::string_view bytes) {
   const AndroidManifest manifest = ParseAndroidManifest({bytes.begin(), bytes.end()});
   Require(!manifest.has_overlaps || !manifest.package_name, "what is too much is not asked for");
-  // A character of two bytes becomes three at most.
+  // A character of two bytes becomes at most three bytes.
   Require(manifest.installer_name.size() <= bytes.size() * 3 / 2, "the name lies in the document");
 }
 
@@ -77,7 +77,7 @@ extern "C" int LLVMFuzzerTestOneInput(const uint8_t* data, size_t size) {
                                                     JudgeAndroidManifest};
   if (size == 0) return 0;
   const size_t which = data[0] % (sizeof(kReaders) / sizeof(kReaders[0]));
-  // A copy of its own size, so that one byte too far is found.
+  // An exact copy, so that reading one byte too far is detected.
   const std::unique_ptr<char[]> copy(new char[size - 1]);
   std::copy(data + 1, data + size, copy.get());
   kReaders[which]({copy.get(), size - 1});

@@ -1,5 +1,6 @@
-// A package influences names and texts of a journal. This reads them as the simulator does: texts
-// and their way back, one line of the tool's log, or a whole run. The first byte says which.
+// A package influences names and texts in a journal. This target reads them as the simulator does:
+// it escapes texts and reads them back, or reads one line of the tool's log, or a whole run. The
+// first byte selects the part.
 #include <algorithm>
 #include <sstream>
 #include <string>
@@ -15,7 +16,7 @@ using nlohmann::json;
 
 namespace {
 
-// Of UTF-8, line ends aside.
+// True if the UTF-8 text has a character that a terminal would obey, apart from line ends.
 bool HasHidden(std::string_view text) {
   while (!text.empty()) {
     const size_t length = Utf8Length(text);
@@ -55,7 +56,7 @@ size_t CountOf(const Events& events, const char* kind, bool is_success) {
   }));
 }
 
-// Nothing is made more of than the kernel said, and nothing is lost.
+// The record claims no more than the kernel answered, and loses no event.
 void JudgeRecord(const Events& events) {
   const RunRecord record = TakeApart(events);
   Require(record.events == events, "the events are kept");
@@ -95,7 +96,7 @@ extern "C" int LLVMFuzzerTestOneInput(const uint8_t* data, size_t size) {
   constexpr void (*kReaders[])(std::string_view) = {JudgeText, JudgeLogLine, JudgeJournal};
   if (size == 0) return 0;
   const size_t which = data[0] % (sizeof(kReaders) / sizeof(kReaders[0]));
-  // A copy of its own size, so that one byte too far is found.
+  // An exact copy, so that reading one byte too far is detected.
   const std::vector<char> copy(data + 1, data + size);
   kReaders[which]({copy.data(), copy.size()});
   return 0;

@@ -1,4 +1,4 @@
-// make_seeds DIRECTORY: what each fuzz target starts from, written to DIRECTORY/<target>/.
+// make_seeds DIRECTORY: writes the first inputs of each fuzz target to DIRECTORY/<target>/.
 #include <cstdio>
 #include <filesystem>
 #include <string>
@@ -174,8 +174,8 @@ void MakeCompiledManifests() {
   Seed("compiled_manifest", "bad-node", CompiledXml().Start("manifest").BadNode().Build());
 }
 
-// The first byte says what the phone is like: 0 is a healthy one, 2 gives the file "user.zu", on
-// 128 an attacker exchanges libraries.
+// The first byte selects the phone: 0 is a healthy one, 2 gives the file "user.zu", on 128 an
+// attacker exchanges libraries.
 void SeedPackage(const std::string& name, const PackageOptions& options, uint8_t phone = 0) {
   Seed("package", name, Concat({{phone}, MakePackage(options).Build()}));
 }
@@ -200,7 +200,7 @@ void MakePackages() {
   SeedPackage("registered-jar", options, 2);
 }
 
-// The first byte says which reader it is for (fuzz/explanation_fuzz.cpp).
+// The first byte selects the reader (fuzz/explanation_fuzz.cpp).
 void SeedExplanation(const std::string& name, uint8_t reader, const Bytes& content) {
   Seed("explanation", name, Concat({{reader}, content}));
 }
@@ -220,7 +220,7 @@ void MakeExplanations() {
   SeedExplanation("compiled-manifest", 4, CompiledManifest("com.example.app", true));
 }
 
-// The first byte says what is read (fuzz/journal_fuzz.cpp).
+// The first byte selects the part (fuzz/journal_fuzz.cpp).
 void MakeJournals() {
   Seed("journal", "text", Concat({{0}, ToBytes("a\u00fc\u202e\xff\uf7ff\n")}));
   Seed("journal", "line", Concat({{1}, ToBytes("VeltSignJni: File not verified: /a\n")}));
@@ -234,8 +234,8 @@ void MakeJournals() {
 )")}));
 }
 
-// Numbers that choose what there is and what happens (fuzz/verdict_fuzz.cpp): a package of one key,
-// which is signed, and whose key is registered.
+// Numbers that choose the package and the events of its run (fuzz/verdict_fuzz.cpp). This package
+// has one key, is signed, and its key is registered.
 void MakeVerdicts() {
   const Bytes package = {0, 1, 0, 1, 1, 0, 1, 0, 1, 0, 0, 1, 0};
   const Bytes run = {0, 0, 1, 1, 0, 1, 3, 1, 0, 1, 0, 0, 1, 2, 2, 0, 1};

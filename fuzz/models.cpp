@@ -7,7 +7,7 @@ namespace {
 
 using namespace std::string_literals;
 
-// A reader at a place in the text, which reads as NUL from its end on.
+// A reader at a position in the text. Past the end, it reads NUL.
 class Reader {
  public:
   explicit Reader(const std::string& text) : text_(text) {}
@@ -28,7 +28,7 @@ class Reader {
     return false;
   }
 
-  // False when there is nothing more to read.
+  // Returns false at the end of the text.
   bool ReadSection() {
     std::map<std::string, std::string> section;
     position_ = std::min(text_.find_first_not_of(" \r\n", position_), text_.size());

@@ -1,5 +1,5 @@
-// Second readers of what the tool reads as text, written only to be compared with the tool's: they
-// cut the text into pieces where the tool walks over its bytes.
+// Second readers of the texts that the tool reads, written only to be compared with the tool's.
+// They cut the text into pieces; the tool walks over its bytes.
 #pragma once
 
 #include <cstdint>
@@ -16,5 +16,5 @@ struct ManifestModel {
 // The sections of a JAR manifest or signature file.
 ManifestModel ReadManifest(const std::string& text);
 
-// What the base64 text stands for, if it is one.
+// The bytes that the base64 text encodes, or nothing if the text is not base64.
 std::optional<std::vector<uint8_t>> ReadBase64(const std::string& text);

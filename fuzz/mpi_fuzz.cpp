@@ -45,7 +45,7 @@ void RequireEqual(const mpi* number, Expected& expected, const char* what) {
   Require(actual == expected, what);
 }
 
-// Limbs as hostile arithmetic likes them: all bits, none, and a few.
+// Limbs that provoke errors of arithmetic: all bits set, none, and a few.
 std::vector<uint32_t> Limbs(FuzzedDataProvider& input, size_t most) {
   constexpr uint32_t kEdges[] = {0, 1, 0xffffffff, 0x80000000, 0x7fffffff, 0xffff0000, 0x10000};
   std::vector<uint32_t> limbs(input.ConsumeIntegralInRange<size_t>(0, most));
@@ -144,7 +144,7 @@ void Remainder(FuzzedDataProvider& input) {
   RequireEqual(r, expected, "mpi_mod_mpi divides");
 }
 
-// Makes `number` the value of the limbs modulo `m`, with at least `room` limbs.
+// Sets `number` to the value of the limbs modulo `m`, with at least `room` limbs.
 void SetBelow(Number& number, std::vector<uint32_t> limbs, Expected& m, size_t room) {
   Number whole;
   whole.Set(limbs, 1);
@@ -167,12 +167,12 @@ void MontgomeryProduct(FuzzedDataProvider& input) {
   m.Set(modulus, 1);
   Expected expected_m(&m);
 
-  // Operands below the modulus; the first with the limb of room that the product needs.
+  // The operands are below the modulus. The first has the extra limb that the product needs.
   SetBelow(a, Limbs(input, n), expected_m, n + 1);
   SetBelow(b, Limbs(input, n), expected_m, input.ConsumeBool() ? n + 1 : 1);
   t.Set(std::vector<uint32_t>(2 * (n + 1), 0x5a5a5a5a), 1);
 
-  uint32_t inverse = 1;  // of the lowest limb; each step doubles the bits that are right
+  uint32_t inverse = 1;  // of the lowest limb; each step doubles the number of right bits
   for (int step = 0; step < 5; ++step) inverse *= 2 - modulus[0] * inverse;
   Expected expected(&a), factor(&b), radix;
   mpz_mul(expected.get(), expected.get(), factor.get());

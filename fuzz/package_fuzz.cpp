@@ -1,6 +1,6 @@
-// The whole tool, from main() on, over any bytes as the package file, on a phone in the program.
-// The first byte of the input says what the phone is like. Whatever is signed or registered is
-// judged by a second reading of the same bytes; memory and descriptors are counted.
+// The whole tool, from main() on, over any bytes as the package file, on a phone inside this
+// program. The first byte of the input selects the phone. A second reading of the same bytes judges
+// every signature and registration. Memory and descriptors are counted.
 #include <dirent.h>
 #include <fcntl.h>
 #include <sanitizer/allocator_interface.h>
@@ -31,14 +31,14 @@ int ToolMain(int argc, char* argv[]);
 
 namespace {
 
-// A run may hold, at its worst moment, this many bytes for each byte of the archive and of what its
-// entries declare, and as much besides for what does not depend on either.
+// The limit of a run's peak memory: this many bytes for each byte of the archive and of the sizes
+// that its entries declare, and a fixed amount for everything else.
 constexpr size_t kBytesPerByte = 16;
 constexpr size_t kBytesBesides = 1 << 20;
 
 std::vector<ZipArchiveHandle> open_archives;
 
-// The directory of the package, in memory, with the libraries that an installer put there.
+// The package's directory, in memory, with the libraries that an installer put there.
 class Installation {
  public:
   Installation() {
@@ -62,7 +62,7 @@ class Installation {
   const std::string& directory() const { return directory_; }
   std::string package() const { return directory_ + "base.apk"; }
 
-  // Puts another file in the library's place, until all are put back.
+  // Replaces the library by another file. All are put back later.
   void Exchange(const std::string& path) {
     const auto file = files_.find(std::filesystem::weakly_canonical(path).string());
     if (file == files_.end()) return;
@@ -86,7 +86,7 @@ Installation& TheInstallation() {
   return installation;
 }
 
-// Bytes that the process holds, and the most that it held, while a run is measured.
+// The bytes that the process holds now, and their peak, while a run is measured.
 std::atomic<bool> is_measured;
 std::atomic<size_t> held, most_held;
 
@@ -117,7 +117,7 @@ std::string PathOf(int fd) {
   return std::filesystem::read_symlink("/proc/self/fd/" + std::to_string(fd)).string();
 }
 
-// Judges what the phone was asked for.
+// Judges what the tool asked the phone for.
 class Judge {
  public:
   Judge(const Bytes& archive, const Phone& phone) : archive_(archive), phone_(phone) {}
@@ -177,7 +177,7 @@ class Judge {
   std::optional<PackageModel> model_;
 };
 
-// Exchanges each library as it is opened for the second time, between its check and its signing.
+// Exchanges each library when it is opened for the second time, between its check and its signing.
 class Attacker {
  public:
   void BeforeOpen(const std::string& path) {
@@ -214,8 +214,8 @@ void RunTool(const std::string& path) {
 
 }  // namespace
 
-// The tool never closes its archive, for the process ends. Here it goes on, so the archives are
-// kept and closed after each run.
+// The tool never closes its archive, because its process ends. This process goes on, so it keeps
+// the archives and closes them after each run.
 extern "C" {
 int32_t __real__Z13OpenArchiveFdiPKcPP10ZipArchiveb(int, const char*, ZipArchiveHandle*, bool);
 int32_t __wrap__Z13OpenArchiveFdiPKcPP10ZipArchiveb(int fd, const char* name,

@@ -31,13 +31,13 @@ struct PackageModel::Archive {
   Archive(const Archive&) = delete;
   Archive& operator=(const Archive&) = delete;
 
-  // 0: there is no such entry.
+  // Returns 0 if the archive has no such entry.
   int Find(const std::string& name, ZipEntry* entry) const {
     const int result = handle == nullptr ? -7 : FindEntry(handle, std::string_view(name), entry);
     return result == -7 ? 0 : result == 0 ? 1 : -1;
   }
 
-  // What is stored is as long as it says, or it is not to be had.
+  // A stored entry must be as long as it declares. Otherwise it cannot be extracted.
   std::optional<Bytes> Extract(ZipEntry entry) const {
     if (entry.method == kCompressStored && entry.compressed_length != entry.uncompressed_length) {
       return std::nullopt;
@@ -137,7 +137,7 @@ bool PackageModel::AllowsLibrary(const std::string& directory, const std::string
   for (const std::string& entry : libraries_) {
     const std::string installed = ApkTools::InstalledLibraryPath("", entry);
     if (installed.empty() || !IsListed(entry, content)) continue;
-    // The tool hands the system the name up to its first NUL.
+    // The tool passes the name to the system as a C string, which ends at the first NUL.
     const std::string target = (directory + installed).c_str();
     if (std::filesystem::weakly_canonical(target) == path) return true;
   }

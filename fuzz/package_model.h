@@ -1,7 +1,7 @@
-// What may be done for an archive, worked out a second time: the judge of the package target. It
-// reads the archive through the platform's zip library, as the tool does, but the texts with the
-// readers of models.h, the signatures with libcrypto, and the digests on a straight walk. Where a
-// library lies the tool itself says; tests/apk/native_libraries_test.cpp has those paths in full.
+// Computes a second time what may be done for an archive. It judges the package target. It reads
+// the archive through the platform's zip library, as the tool does. It reads texts with models.h,
+// checks signatures with libcrypto, and compares digests in one straight walk.
+// It asks the tool where a library lies; tests/apk/native_libraries_test.cpp pins those paths.
 #pragma once
 
 #include <map>
@@ -16,13 +16,13 @@ class PackageModel {
  public:
   explicit PackageModel(const Bytes& archive);
 
-  // Holds "AndroidManifest.xml".
+  // The archive holds "AndroidManifest.xml".
   bool is_package() const { return is_package_; }
-  // Signed by `key`, manifest and classes.dex as signed.
+  // The package is signed by `key`, and its manifest and classes.dex are as signed.
   bool is_good() const { return is_good_; }
   const Bytes& key() const { return key_; }
-  // Whether one of the libraries in the archive lands at `path`, for a package installed in
-  // `directory` (with its "/"), and is listed with the digest of `content`.
+  // True if one of the archive's libraries is installed at `path`, for a package in `directory`
+  // (with its "/"), and is listed with the digest of `content`.
   bool AllowsLibrary(const std::string& directory, const std::string& path,
                      const Bytes& content) const;
 
@@ -35,8 +35,8 @@ class PackageModel {
 
   bool Judge(const Archive& archive);
   bool IsListed(const std::string& name, const Bytes& content) const;
-  // Whether the first section of the signature file that has a digest has that of the manifest; of
-  // several in the section the last counts.
+  // True if the signature file's first section with a digest states that of the manifest. Of
+  // several digests in the section the last counts.
   static bool StatesDigestOf(const Bytes& manifest, const ManifestModel& signature_file);
   static bool IsDigest(const std::string& attribute, const Bytes& digest, const Bytes& content);
 
@@ -47,6 +47,6 @@ class PackageModel {
   std::map<std::string, Listed> listed_;
 };
 
-// The bytes that the entries of the archive declare, those left out that claim more than deflate
-// could make of their data.
+// The sum of the sizes that the archive's entries declare. Entries that declare more than deflate
+// could make of their data are left out.
 size_t DeclaredBytes(const Bytes& archive);

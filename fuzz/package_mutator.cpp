@@ -22,7 +22,7 @@ using Items = std::vector<ZipItem>;
 constexpr size_t kMostItems = 64;
 constexpr size_t kLongestItem = 1 << 16;
 
-// The entries in the order of their data; none when the archive cannot be read.
+// The entries in the order of their data; empty if the archive cannot be read.
 Items ReadItems(const Bytes& bytes) {
   ZipArchiveHandle archive = nullptr;
   void* cookie = nullptr;
@@ -101,7 +101,8 @@ void EditText(ZipItem& item, const std::string& name, const std::string& suffix,
   item.data = ToBytes(text);
 }
 
-// Makes good, from the bottom up: the signatures (1), the manifest's digest (2), the entries' (3).
+// Repairs, from the bottom up: the signatures (1), the manifest's digest (2), the entries' digests
+// (3).
 void Repair(Items& items, unsigned depth) {
   const auto find = [&](const std::string& end) {
     return std::find_if(items.begin(), items.end(),

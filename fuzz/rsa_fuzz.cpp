@@ -1,5 +1,5 @@
-// crypto/rsa.h: any key and signature. The encoded message is computed by libcrypto as well, and
-// the answer that it deserves is worked out here a second time.
+// crypto/rsa.h: any key and signature. libcrypto computes the encoded message as well, and this
+// file computes the right answer a second time.
 #include "crypto/rsa.h"
 
 #include <algorithm>
@@ -33,7 +33,7 @@ int JudgeMd(Bytes digest_info, const Bytes& md5) {
   return algorithm == 5 ? Judge(digest_info, prefix, md5) : kBadPadding;
 }
 
-// RFC 8017 section 9.2, without a least length of the padding.
+// RFC 8017 section 9.2, but without a minimum length of the padding.
 int JudgeMessage(const Case& c, const Bytes& message) {
   if (message[0] != 0 || message[1] != 1) return kBadPadding;
   const auto separator =
@@ -70,7 +70,7 @@ Bytes Take(FuzzedDataProvider& input, size_t size) {
 
 Case ReadCase(FuzzedDataProvider& input) {
   constexpr size_t kLengths[] = {15, 16, 34 + 3, 35 + 3, 51 + 3, 64, 65, 66, 128, 512, 513};
-  // 1 lets the input write the encoded message itself.
+  // With the exponent 1, the input writes the encoded message itself.
   constexpr uint32_t kExponents[] = {1, 3, 17, 65537, 0, 2, 0x80000000, 0xffffffff, 0x7fffffff};
   const auto length = input.ConsumeBool() ? input.PickValueInArray(kLengths)
                                           : input.ConsumeIntegralInRange<size_t>(0, 140);

@@ -15,7 +15,7 @@ Bytes Copy(const uint8_t* place, size_t length, const Bytes& block) {
   return Bytes(place, place + length);
 }
 
-// What RFC 2315 section 9 and RFC 5280 section 4.1 put where.
+// The fields as RFC 2315 section 9 and RFC 5280 section 4.1 place them.
 struct StrictBlock {
   CBS tbs;  // header included
   CBS modulus, exponent, certificate_signature, encrypted_digest;
@@ -89,9 +89,9 @@ Bytes VerifiedKey(const pkcs7& record, const Bytes& block, const Bytes& signatur
   if (modulus.empty() || tbs.empty()) return {};
   uint32_t exponent;
   memcpy(&exponent, record.exponent, sizeof(exponent));
-  // To the power of 1 or -1 everyone can sign for everyone.
+  // With the exponent 1 or -1 anyone can make a signature for anyone.
   if (exponent == 1 || exponent == 0xffffffff) return {};
-  // A signature is read in the modulus's length, whatever length it says itself.
+  // A signature is read in the modulus's length. The length in the block is ignored.
   const bool good =
       Verifies(modulus, exponent, tbs, Copy(record.cert_signature, size, block)) &&
       Verifies(modulus, exponent, signature_file, Copy(record.signed_digest, size, block));

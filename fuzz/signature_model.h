@@ -1,14 +1,14 @@
-// What a signature block may say, by libcrypto: the judge of the targets that verify one.
+// Reads signature blocks by libcrypto: the judge of the targets that verify one.
 #pragma once
 
 #include "crypto/pkcs7.h"
 #include "support/der.h"
 
-// The signer's key if both signatures of the block are good, by libcrypto's arithmetic over the
-// bytes at which the record points; else empty. Those bytes must lie in the block, and the exponent
-// must be one with which a signature takes the private key.
+// Returns the signer's key if both signatures of the block are good, by libcrypto's arithmetic over
+// the bytes at which the record points; else empty. Those bytes must lie in the block, and the
+// exponent must not be 1 or -1, with which anyone can sign.
 Bytes VerifiedKey(const pkcs7& record, const Bytes& block, const Bytes& signature_file);
 
-// Where the block is DER to the letter and its signer has no authenticated attributes, what the
-// record says of it must be what a strict reader says.
+// If the block is strict DER and its signer has no authenticated attributes, the record must equal
+// the one that a strict reader makes.
 void CompareWithStrictReader(const pkcs7& record, const Bytes& block);

@@ -1,22 +1,22 @@
-// The signer of the fuzz targets: makes good what a mutation broke, so that mutated bytes get past
-// the checks that they would only bounce off.
+// The signer of the fuzz targets. It repairs digests and signatures after a mutation, so that
+// mutated bytes get past the checks that would stop them.
 #pragma once
 
 #include <string>
 
 #include "support/der.h"
 
-// The test key of all seeds: the smallest for which an encoded message has room.
+// The test key of all seeds: the smallest one with room for an encoded message.
 inline constexpr char kFuzzKey[] = "rsa-512";
 
-// Writes good signatures into the signature block: the certificate's own and the signer's, over the
-// signature file. The block keeps its length and all of its other bytes. Does nothing when the
-// block does not parse, holds another modulus than the fuzz key's or an exponent that has no
-// inverse, or has no room for a signature.
+// Writes good signatures into the signature block: the certificate's own, and the signer's over the
+// signature file. The block keeps its length and all other bytes. Does nothing if the block does
+// not parse, if its modulus is not the fuzz key's, if its exponent has no inverse, or if a
+// signature does not fit.
 void SignAgain(Bytes& block, const Bytes& signature_file);
 
-// Writes the right digests into the text, which keeps its length: for each "SHA1-Digest" and
-// "SHA-256-Digest" (and then `suffix`) in the section that names `name`, or anywhere when `name` is
-// empty, the digest of the data.
+// Writes the right digests into the text, which keeps its length. Replaces each "SHA1-Digest" and
+// "SHA-256-Digest" (followed by `suffix`) in the section that names `name` by the data's digest. An
+// empty `name` means every section.
 void DigestAgain(std::string& text, const std::string& name, const std::string& suffix,
                  const Bytes& data);

@@ -1,6 +1,6 @@
-// The verdict on a made-up run and a made-up package, held against what the kernel was asked and
-// what it answered: never another key than the kernel got, never "signed" for what was not, and
-// nothing that went wrong is left out. What is shown of it may not say anything else.
+// The verdict on an invented run of an invented package, compared with the kernel's calls and
+// answers. The verdict must not name another key than the kernel got, nor call anything signed that
+// is not, nor leave out a failure. The shown text must not contradict it.
 #include <algorithm>
 #include <sstream>
 #include <string>
@@ -25,13 +25,13 @@ const std::string kPayloads[] = {"2000" + kDigests[0], "2000" + kDigests[1], "00
 const std::string kPaths[] = {"/app/base.apk", "/app/lib/arm64/liba.so", "/app/lib/arm/liba.so",
                               "/b", ""};
 
-// Numbers from the front of the input; zeros behind its end.
+// Numbers from the front of the input; zeros after its end.
 class Input {
  public:
   Input(const uint8_t* data, size_t size) : at_(data), end_(data + size) {}
 
   bool IsAtEnd() const { return at_ == end_; }
-  // Below `count`.
+  // A number below `count`.
   size_t Number(size_t count) { return IsAtEnd() ? 0 : *at_++ % count; }
   bool Flag() { return Number(2) == 1; }
   template <typename Value, size_t count>
@@ -44,7 +44,7 @@ class Input {
   const uint8_t* const end_;
 };
 
-// The journal of a run, and what a judge needs to know of what happened.
+// The journal of a run, and the facts that the judge needs.
 struct Run {
   std::string journal = Event("start").Text("file", "base.apk").Text("path", kPaths[0]).Line();
   std::vector<std::string> granted;  // the payloads of what the kernel signed
@@ -203,7 +203,7 @@ void JudgeVerdict(const Run& run, const PackageFacts& facts, const Report& repor
   Require(!is_good || !facts.was_changed || HasWarning(report, cause::kFileChanged), "a change");
 }
 
-// The line of the verdict names the right key, and the warnings against it.
+// The verdict's line names the right key, and no warning contradicts it.
 void JudgeShown(const Report& report) {
   std::ostringstream line, all;
   PrintReport(report, Detail::kVerdict, Look(), line);

@@ -1,5 +1,5 @@
-// crypto/x509.h: any bytes as a certificate. What the platform's libcrypto reads as well, it must
-// read from the same places.
+// crypto/x509.h: any bytes as a certificate. If the platform's libcrypto reads the certificate as
+// well, both must find the fields in the same places.
 #include "crypto/x509.h"
 
 #include <openssl/mem.h>

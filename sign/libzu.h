@@ -7,5 +7,5 @@
 // everything. IsZuSuccess tells what the result means.
 extern "C" int ZuNewCertificate(int fd, const char* name, const unsigned char* data, size_t length);
 
-// Two results mean success, every other is a failure.
+// Two results mean success. Every other result is a failure.
 constexpr bool IsZuSuccess(int result) { return result == 0 || result == 0x10004; }

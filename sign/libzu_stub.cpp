@@ -1,5 +1,5 @@
-// libzu for a product without the closed library: every registration is refused, and the tool's log
-// says so.
+// libzu for a product without the closed library. It refuses every registration, and the tool logs
+// each refusal.
 #include "sign/libzu.h"
 
 int ZuNewCertificate(int /*fd*/, const char* /*name*/, const unsigned char* /*data*/,

@@ -41,7 +41,7 @@ void RegisterJar(int zip_fd, int fd) {
   ReportResult(ZuNewCertificate(fd, jar_path.c_str(), block.data(), block.size()));
 }
 
-// Also the way of a file that is not a zip archive: it asks for no permission, and ends silently.
+// A file that is not a zip archive comes here, too. It asks for no permission, so nothing happens.
 void RegisterPackage(ApkTools::Apk& apk, int fd) {
   if (!apk.IsSsPermissionRequired()) return;
   if (!apk.IsGoodApk()) {
@@ -53,10 +53,10 @@ void RegisterPackage(ApkTools::Apk& apk, int fd) {
   ReportResult(ZuNewCertificate(fd, apk.GetPackageName().c_str(), key.data(), key.size()));
 }
 
-// An attribute that is missing, empty or unreadable does not ask.
+// A JAR does not ask if the attribute is missing, empty or unreadable.
 bool AsksForRegistration(int jar_fd) { return fgetxattr(jar_fd, "user.zu", nullptr, 0) >= 1; }
 
-// 128 bytes: four SHA-256 digests, the first of the path's bytes, each other of the one before it.
+// 128 bytes: four SHA-256 digests. The first is of the path, each other of the digest before it.
 std::vector<uint8_t> JarKeyBlock(const std::string& path) {
   constexpr size_t kBlockSize = 128;
   std::vector<uint8_t> block;
@@ -70,8 +70,8 @@ std::vector<uint8_t> JarKeyBlock(const std::string& path) {
   return block;
 }
 
-// Deliberate: the location of `fd` serves for this message alone; the registration goes ahead. The
-// text says "oat" of packages and JARs alike. Programs that parse the log match on it.
+// Deliberate: only this message needs the path of `fd`, so registration continues without it. The
+// text says "oat" for packages and JARs alike. Programs that parse the log match on it.
 void ReportMissingLocation(int fd) {
   if (GetFilenameByFd(fd).empty()) LogError("Can't get oat location from fd=%d\n", fd);
 }

@@ -42,7 +42,7 @@ uint32_t VeltSignJni(ApkTools::Apk& apk, int fd, const char* /*path*/) {
     LogError("VeltSignJni: malformed apk: %s\n", apk.GetPath().c_str());
     return kVeltFailure;
   }
-  // A walk that cannot start leaves the cookie null, and then delivers nothing.
+  // If the walk cannot start, the cookie stays null and Next delivers nothing.
   void* cookie = nullptr;
   apk.StartIteration(&cookie, "lib/", ".so");
   ZipEntry entry;
@@ -53,14 +53,14 @@ uint32_t VeltSignJni(ApkTools::Apk& apk, int fd, const char* /*path*/) {
     LogError("VeltSignJni: File not verified: %s\n", target.c_str());
   }
   apk.EndIteration(cookie);
-  // Deliberate: a library that was refused does not change the result; its own message tells.
+  // Deliberate: a refused library does not change the result. Its own message tells about it.
   LogInfo("VeltSignJni finished: %u.\n", 0U);
   return 0;
 }
 
 namespace {
 
-// Signs `fd`, the package file or one of its libraries, with the payload that suits `apk`.
+// Signs `fd`, the package file or one of its libraries, with the payload for this kind of file.
 uint32_t VeltSignOat(ApkTools::Apk& apk, int fd) {
   return apk.IsApk() ? SignAsPackage(apk, fd) : SignAsJar(apk, fd);
 }
@@ -70,7 +70,7 @@ uint32_t SignAsPackage(ApkTools::Apk& apk, int fd) {
   if (!apk.IsGoodApk()) return kVeltFailure;
   std::vector<uint8_t> digest;
   ComputeSHA256Digest(apk.GetManufacturerKey(), digest);
-  // Lives on until errno was read.
+  // The payload must live until errno has been read.
   const std::vector<uint8_t> payload = SignPayload(digest);
   const uint32_t result = VeltSignFd(fd, payload.data());
   if (result != 0) {
@@ -82,7 +82,7 @@ uint32_t SignAsPackage(ApkTools::Apk& apk, int fd) {
 
 uint32_t SignAsJar(ApkTools::Apk& apk, int fd) {
   LogInfo("VeltSignOat: non-Apk (Jar) case\n");
-  // Deliberate: what must be trusted already is the file that was opened as the archive, not `fd`.
+  // Deliberate: the kernel must already trust the file that was opened as the archive, not `fd`.
   uint32_t result = VeltVerifyFd(apk.GetFd());
   if (result != 0) {
     const int error = errno;
@@ -111,10 +111,10 @@ std::vector<uint8_t> SignPayload(const std::vector<uint8_t>& data) {
   return payload;
 }
 
-// Returns false if nobody vouches for the file. Every other failure is logged here.
+// Returns false if the file does not match the signed manifest. Logs every other failure here.
 bool SignLibrary(ApkTools::Apk& apk, const std::string& entry_name, const std::string& target) {
   // The digested file stays open, so that no other file can get its inode number meanwhile. Its
-  // descriptor is a high one: the file that is signed gets the lowest that is free.
+  // descriptor is a high one, so that the file to sign gets the lowest free descriptor.
   constexpr int kFarDescriptor = 100;
   const ScopedFd kept(fcntl(ScopedFd(OpenForReading(target.c_str(), O_CLOEXEC)).get(),
                             F_DUPFD_CLOEXEC, kFarDescriptor));
@@ -124,15 +124,15 @@ bool SignLibrary(ApkTools::Apk& apk, const std::string& entry_name, const std::s
   const ScopedFd library(OpenForReading(target.c_str(), 0));
   if (library.get() < 0) {
     const int error = errno;
-    // Deliberate: without a line end. Programs that parse the log match on the text.
+    // Deliberate: the text has no line end. Programs that parse the log match on it.
     LogError("File %s is not opened", target.c_str());
     LogError("Error %d: %s.\n", error, strerror(error));
     return true;
   }
-  // Deliberate: a file is signed only if its state, as fstat tells it, is still what it was before
-  // its bytes were digested. An entry's name may lead into a directory that others write to, so
-  // `target` may be another file by now. A file that was exchanged, or only touched, is digested
-  // again, now through the descriptor that is signed (docs/decisions/the-file-that-was-read.md).
+  // Deliberate: a file is signed only if fstat still gives the state that it had before its bytes
+  // were digested. An entry's name may lead into a directory that others can write to, so `target`
+  // may be another file by now. An exchanged or touched file is digested again, now through the
+  // descriptor that is signed (docs/decisions/the-file-that-was-read.md).
   constexpr int kMostDigests = 3;
   struct stat opened = {};
   fstat(library.get(), &opened);

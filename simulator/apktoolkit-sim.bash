@@ -24,23 +24,34 @@ _apktoolkit_sim() {
       mapfile -t COMPREPLY < <(compgen -W "0 65540 -1" -- "$word")
       ;;
     --install)
-      mapfile -t COMPREPLY < <(compgen -W "phone all arm64 arm" -- "$word")
+      mapfile -t COMPREPLY < <(compgen -W "phone all arm64 arm no" -- "$word")
+      ;;
+    --installer)
+      mapfile -t COMPREPLY < <(compgen -W "auto required off" -- "$word")
+      ;;
+    --api)
+      mapfile -t COMPREPLY < <(compgen -W "27- 27-29 30-" -- "$word")
       ;;
     --state)
       compopt -o filenames
       mapfile -t COMPREPLY < <(compgen -d -- "$word")
       ;;
+    --files-from)
+      compopt -o filenames
+      mapfile -t COMPREPLY < <(compgen -f -- "$word")
+      ;;
     --runner | --tool)
       compopt -o filenames
       mapfile -t COMPREPLY < <(compgen -c -- "$word" && compgen -f -- "$word")
       ;;
-    --timeout | --jobs | -h | --help | --version) ;;
+    --timeout | --jobs | --signer | -h | --help | --version) ;;
     *)
       if [[ $word == -* ]]; then
         mapfile -t COMPREPLY < <(
-          compgen -W "--help --html --install --integrity --jobs --journal --json --quiet
-            --runner --sign-errno --state --strict --timeout --tool --trust --verbose --verify
-            --verify-errno --version --zu-result" -- "$word"
+          compgen -W "--api --files-from --help --html --install --installer --integrity --jobs --journal
+            --json --junit --null --quiet --recursive --runner --sarif --sign-errno --signer --state
+            --strict --timeout --tool --trust --verbose --verify --verify-errno --version --werror
+            --zu-result" -- "$word"
         )
       else
         compopt -o filenames

@@ -1,42 +1,76 @@
 // apktoolkit-sim: the phone that apktoolkit runs in, on a workstation.
+#include <future>
+#include <memory>
 #include <utility>
 
+#include "simulator/installer/installer.h"
 #include "simulator/options.h"
+#include "simulator/run/file_list.h"
 #include "simulator/run/process.h"
 #include "simulator/run/queue.h"
 #include "simulator/run/simulator.h"
 #include "simulator/show/presenter.h"
+#include "simulator/verdict/gate.h"
 #include "simulator/verdict/make_report.h"
+#include "simulator/verdict/wording.h"
 
 int main(int argc, char** argv) {
   using namespace simulator;
   const bool has_standard_input = KeepStandardStreams();
   Options options;
   if (const auto status = ParseOptions(argc, argv, &options)) return EndWith(*status);
-  const std::vector<std::string>& files = options.files;
+  FileList list;
+  if (const auto problem = ListFiles(options.files, &list)) return Complain(kUsageError, *problem);
+  const std::vector<ListedFile>& files = list.files;
   Simulator simulator(options.run, has_standard_input);
+  Installer installer(options.installer);
+  Gate gate(options.gate);
   Presenter presenter(options.show, files.size());
-  std::vector<std::string> inputs = files;
+  std::vector<std::string> names;
+  for (const ListedFile& file : files) names.push_back(file.name);
+  std::vector<std::string> inputs = names;
+  inputs.push_back(options.files.list);
   inputs.insert(inputs.end(), options.run.trust.begin(), options.run.trust.end());
   inputs.push_back(options.run.tool);
   if (const auto objection = presenter.Objection(inputs)) return Complain(kUsageError, *objection);
-  if (const auto problem = simulator.Prepare()) return Complain(kCannotSimulate, *problem);
+  if (const auto problem = simulator.Prepare()) return presenter.GiveUp(names, *problem);
+  if (options.installer.use == InstallerUse::kRequired) {
+    if (const auto missing = installer.Missing()) return presenter.GiveUp(names, *missing);
+  }
   if (!presenter.Begin()) return kCannotSimulate;
+  if (list.others > 0) {
+    const std::string others = Counted(list.others, "file", "files");
+    Complain(kAllSigned,
+             others + " below the directories left out, by their names: not a package's");
+  }
   CatchInterruptions();
-  std::vector<std::optional<FileRun>> runs(files.size());
+  std::vector<std::unique_ptr<FileRun>> runs(files.size());
+  std::vector<Judgement> judgements(files.size());
   RunInOrder(
-      files.size(), options.run.jobs, [&](size_t i) { runs[i] = simulator.Run(files[i]); },
+      files.size(), options.run.jobs,
       [&](size_t i) {
-        const FileRun run = *std::exchange(runs[i], std::nullopt);
-        const Report report = MakeReport(run.record, run.facts, options.judge);
+        // The two do not know of each other, and so they work at the same time.
+        const bool is_run = files[i].state == ListedFile::State::kToRun;
+        auto judged = std::async(std::launch::async, [&] {
+          return is_run ? installer.Judge(files[i].name) : Judgement();
+        });
+        runs[i] = std::make_unique<FileRun>(simulator.Run(files[i]));
+        judgements[i] = judged.get();
+      },
+      [&](size_t i) {
+        const auto owned = std::move(runs[i]);
+        const FileRun& run = *owned;
+        const Judgement judgement = std::exchange(judgements[i], {});
+        Report report = MakeReport(run.record, run.facts, options.judge, judgement);
+        gate.Judge(&report);
         if (options.verify) {
           presenter.ShowAnswer(run.record, report, run.journal);
         } else {
           presenter.Show(report, run.journal);
         }
       },
-      [&](size_t i, int seconds) { presenter.ShowProgress(files[i], seconds); });
-  const int status = presenter.Finish();
+      [&](size_t i, int seconds) { presenter.ShowProgress(names[i], seconds); });
+  const int status = presenter.Finish(names);
   EndIfInterrupted();
   return status;
 }

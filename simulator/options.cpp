@@ -4,6 +4,7 @@
 #include <algorithm>
 #include <cmath>
 #include <cstring>
+#include <ctime>
 #include <iostream>
 
 #include "simulator/phone/text.h"
@@ -20,13 +21,22 @@ constexpr char kDescription[] =
 constexpr char kFooter[] =
     "Exit status, the highest of all FILEs:\n"
     "  0  all was signed that was to be signed\n"
-    "  1  something was refused\n"
+    "  1  something was refused: by the tool, by a phone's installer, or by --signer\n"
+    "     or --werror\n"
     "  2  the command line is wrong\n"
     "  3  the simulation could not run, or did not end in time\n"
     "  4  the tool could not look at a FILE: missing, no permission, read-only\n"
     "More, with examples: man apktoolkit-sim";
 
+constexpr struct {
+  const char* name;
+  InstallerUse use;
+} kInstallerUses[] = {{"auto", InstallerUse::kAuto},
+                      {"required", InstallerUse::kRequired},
+                      {"off", InstallerUse::kOff}};
+
 constexpr char kInstall[] = "--install";
+constexpr char kInstallNo[] = "no";
 constexpr struct {
   const char* name;
   InstalledAbi abi;
@@ -38,12 +48,17 @@ constexpr struct {
 std::vector<std::string> CommandLineOf(int argc, char** argv);
 void AddPhone(CLI::App* app, Options* options);
 void AddKernelAnswer(CLI::App* app, const char* name, int* error, const char* description);
+void AddFiles(CLI::App* app, Options* options);
 void AddInstallation(CLI::App* app, Options* options);
+void AddInstaller(CLI::App* app, Options* options);
+void AddGate(CLI::App* app, Options* options);
 void AddOutput(CLI::App* app, Options* options);
 void AddRun(CLI::App* app, Options* options, std::string* runner);
 void AddVerify(CLI::App* app, Options* options);
+bool ReadLevels(const std::string& text, LevelRange* levels);
 int ErrorNumber(const std::string& name);
 std::optional<int> NameUnknownOption(const CLI::App& app);
+int MissFile();
 
 }  // namespace
 
@@ -52,15 +67,17 @@ std::optional<int> ParseOptions(int argc, char** argv, Options* options) {
   app.footer(kFooter);
   app.get_formatter()->column_width(28);
   app.allow_extras();  // so that they can be named
+  options->installer.program = ProgramDirectory() + "/../lib/apktoolkit/installer.jar";
   std::string runner;
 
-  app.add_option("FILE", options->files, "Packages, JARs or other files")
-      ->type_name("")
-      ->required();
+  app.add_option("FILE", options->files.names, "Packages, JARs or other files")->type_name("");
   app.option_defaults()->group("The phone");
   AddPhone(&app, options);
   app.option_defaults()->group("The run");
+  AddFiles(&app, options);
   AddInstallation(&app, options);
+  AddInstaller(&app, options);
+  AddGate(&app, options);
   AddOutput(&app, options);
   AddRun(&app, options, &runner);
   AddVerify(&app, options);
@@ -68,21 +85,35 @@ std::optional<int> ParseOptions(int argc, char** argv, Options* options) {
   app.set_version_flag("--version", "apktoolkit-sim " APKTOOLKIT_VERSION, "Print the version");
   try {
     app.parse(CommandLineOf(argc, argv));
-  } catch (const CLI::RequiredError& error) {
-    if (const auto status = NameUnknownOption(app)) return status;
-    app.exit(error);
-    return kUsageError;
+    if (options->verify && options->run.install == InstallWhen::kAlways) {
+      throw CLI::ExcludesError("--verify", kInstall);
+    }
   } catch (const CLI::ParseError& error) {
     return app.exit(error) == 0 ? 0 : kUsageError;
+  }
+  options->installer.timeout = options->run.timeout;
+  if (options->verify) {
+    options->installer.use = InstallerUse::kOff;
+    options->run.install = InstallWhen::kNever;
   }
   for (const std::string& word : Split(runner, ' ')) {
     if (!word.empty()) options->run.runner.push_back(word);
   }
-  if (app.count("--tool") == 0) {
+  if (options->show.journal == "-") {
+    options->show.json = true;
+    options->show.journal.clear();
+  }
+  options->judge.now = time(nullptr);
+  options->run.is_own_tool = app.count("--tool") == 0;
+  if (options->run.is_own_tool) {
     options->run.tool =
         ProgramDirectory() + (options->verify ? "/apktoolkit-verify" : "/apktoolkit");
+  } else {
+    options->show.tool = options->run.tool;
   }
-  return NameUnknownOption(app);
+  if (const auto status = NameUnknownOption(app)) return status;
+  if (options->files.names.empty() && options->files.list.empty()) return MissFile();
+  return {};
 }
 
 namespace {
@@ -132,26 +163,103 @@ void AddKernelAnswer(CLI::App* app, const char* name, int* error, const char* de
   app->add_option_function<std::string>(name, set, description)->type_name("NAME")->check(check);
 }
 
+void AddFiles(CLI::App* app, Options* options) {
+  FileListOptions* const files = &options->files;
+  app->add_flag("--recursive", files->is_recursive,
+                "A directory stands for the packages in and\n"
+                "below it: .apk .jar .apks .xapk .apkm .aab");
+  const auto is_name = [](const std::string& name) {
+    return name.empty() ? "the name is empty" : std::string();
+  };
+  CLI::Option* const list = app->add_option("--files-from", files->list,
+                                            "Read more FILEs from a list, one a line;\n"
+                                            "\"-\" is standard input")
+                                ->type_name("LIST")
+                                ->check(is_name);
+  app->add_flag("-0,--null", files->has_nul, "The names of the list end with NUL bytes")
+      ->needs(list);
+}
+
 void AddInstallation(CLI::App* app, Options* options) {
   const auto install = [options](const std::string& name) {
+    options->run.install = name == kInstallNo ? InstallWhen::kNever : InstallWhen::kAlways;
     for (const auto& abi : kAbis) {
       if (name == abi.name) options->run.abi = abi.abi;
     }
   };
   const auto check = [](const std::string& name) {
-    const bool is_known = std::any_of(std::begin(kAbis), std::end(kAbis),
-                                      [&name](const auto& abi) { return name == abi.name; });
-    return is_known ? std::string() : "there are phone, all, arm64 and arm, and no " + name;
+    const bool is_known =
+        name == kInstallNo || std::any_of(std::begin(kAbis), std::end(kAbis),
+                                          [&name](const auto& abi) { return name == abi.name; });
+    return is_known ? std::string() : "there are phone, all, arm64, arm and no, and no " + name;
   };
   app->add_option_function<std::string>(kInstall, install,
                                         "Lay the libraries out first, as an installer\n"
-                                        "does, in a folder of their own: for phone, all,\n"
-                                        "arm64 or arm [default: phone]")
+                                        "does, in a directory of their own: for phone,\n"
+                                        "all, arm64 or arm; \"no\" never does that\n"
+                                        "[default: phone, if a package lies alone]")
       ->type_name("[=ABI]")
-      ->check(check);
+      ->check(check)
+      ->take_last();
   app->add_flag("--strict", options->judge.is_strict,
                 "A library that does not lie beside its package\n"
                 "counts as refused");
+}
+
+void AddInstaller(CLI::App* app, Options* options) {
+  InstallerOptions* const installer = &options->installer;
+  const auto use = [installer](const std::string& name) {
+    for (const auto& each : kInstallerUses) {
+      if (name == each.name) installer->use = each.use;
+    }
+  };
+  const auto is_use = [](const std::string& name) {
+    const bool is_known = std::any_of(std::begin(kInstallerUses), std::end(kInstallerUses),
+                                      [&name](const auto& each) { return name == each.name; });
+    return is_known ? std::string() : "there are auto, required and off, and no " + name;
+  };
+  app->add_option_function<std::string>("--installer", use,
+                                        "Ask also what a phone's installer says, by\n"
+                                        "apksig: auto (where it is there), required or\n"
+                                        "off [default: auto]")
+      ->type_name("WHEN")
+      ->check(is_use)
+      ->take_last();
+  const auto set = [installer](const std::string& text) { ReadLevels(text, &installer->levels); };
+  const auto is_range = [](const std::string& text) {
+    LevelRange levels = {0, 0};
+    return ReadLevels(text, &levels) ? std::string()
+                                     : text + " is no API level and no range such as 27-33";
+  };
+  app->add_option_function<std::string>("--api", set,
+                                        "Whether phones of these API levels install it\n"
+                                        "[default: 27 and later]")
+      ->type_name("LEVEL[-LEVEL]")
+      ->check(is_range);
+}
+
+void AddGate(CLI::App* app, Options* options) {
+  std::vector<std::string>* const signers = &options->gate.signers;
+  const auto is_digest = [](const std::string& text) {
+    return ReadDigest(text) ? std::string()
+                            : text +
+                                  " is no SHA-256 digest: 64 hexadecimal digits, or 32 pairs "
+                                  "of them with colons between";
+  };
+  const auto add = [signers](const std::vector<std::string>& texts) {
+    for (const std::string& text : texts) signers->push_back(*ReadDigest(text));
+  };
+  app->add_option_function<std::vector<std::string>>(
+         "--signer", add,
+         "Refuse what is signed by another. SHA256 is the\n"
+         "digest of certificate, public key or modulus;\n"
+         "may be repeated")
+      ->type_name("SHA256")
+      ->check(is_digest)
+      ->allow_extra_args(false);
+  app->add_flag("--werror", options->gate.refuses_warnings,
+                "Warnings count as refusals, and so does a\n"
+                "package that phones install for another signer");
 }
 
 void AddOutput(CLI::App* app, Options* options) {
@@ -169,7 +277,11 @@ void AddOutput(CLI::App* app, Options* options) {
         "Print also what the signature leaves out, every\n"
         "signer, and the chain from key to entries");
   app->add_flag("--json", options->show.json, "Print the journal, one JSON object a line");
-  app->add_option("--journal", options->show.journal, "Keep the journal in FILE")
+  app->add_option("--journal", options->show.journal, "Keep the journal in FILE; - is --json")
+      ->type_name("FILE");
+  app->add_option("--junit", options->show.junit, "Write test results to FILE, as JUnit does")
+      ->type_name("FILE");
+  app->add_option("--sarif", options->show.sarif, "Write results to FILE, as a SARIF 2.1.0 log")
       ->type_name("FILE");
   app->add_option("--html", options->show.html, "Write all of it to FILE, a page for a browser")
       ->type_name("FILE");
@@ -206,9 +318,11 @@ void AddVerify(CLI::App* app, Options* options) {
                                             "Sign nothing: ask the kernel which FILEs it\n"
                                             "trusts, by the apktoolkit-verify beside this\n"
                                             "program");
-  for (const char* name : {kInstall, "--strict", "--quiet", "--verbose", "--html"}) {
+  for (const char* name : {"--signer", "--werror", "--strict", "--recursive", "--quiet",
+                           "--verbose", "--html", "--junit", "--sarif"}) {
     verify->excludes(app->get_option(name));
   }
+  verify->option_text(" ");  // in place of all that it excludes, which is too long for a line
 }
 
 // What begins with "-" and is no option may have been meant for a file.
@@ -220,6 +334,27 @@ std::optional<int> NameUnknownOption(const CLI::App& app) {
   std::cerr << "there is no option " << word << " (a file of that name: ./" << word
             << ")\nRun with --help for more information.\n";
   return kUsageError;
+}
+
+int MissFile() {
+  std::cerr << "FILE is required, or --files-from\nRun with --help for more information.\n";
+  return kUsageError;
+}
+
+// LEVEL, LEVEL-LEVEL or LEVEL-, of which the last has no end.
+bool ReadLevels(const std::string& text, LevelRange* levels) {
+  constexpr size_t kMostDigits = 5;
+  const std::vector<std::string> parts = Split(text, '-');
+  const auto is_number = [](const std::string& part) {
+    return !part.empty() && part.size() <= kMostDigits &&
+           part.find_first_not_of("0123456789") == std::string::npos;
+  };
+  if (parts.size() > 2 || !is_number(parts[0])) return false;
+  const bool has_end = parts.size() == 1 || !parts[1].empty();
+  if (has_end && !is_number(parts.back())) return false;
+  levels->first = std::stoi(parts[0]);
+  levels->last = has_end ? std::stoi(parts.back()) : kNewestLevel;
+  return levels->first >= 1 && levels->first <= levels->last;
 }
 
 // 0 when there is no error of this name.

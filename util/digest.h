@@ -1,12 +1,12 @@
 // One-shot digests of bytes in memory, by the platform's crypto library: MD5 (RFC 1321), SHA-1 and
-// SHA-256 (FIPS 180-4). Nothing is kept between calls, nothing is logged, and none can fail. The
-// caller owns both vectors, which must be two different ones.
+// SHA-256 (FIPS 180-4). The functions keep no state, log nothing and cannot fail. The caller owns
+// both vectors, which must not be the same one.
 #pragma once
 
 #include <cstdint>
 #include <vector>
 
-// Each makes `out`, whatever it held, the digest of all of `in`; an empty `in` is digested too.
+// Each replaces the contents of `out` by the digest of all of `in`, which may be empty.
 
 // 16 bytes.
 void ComputeMD5Digest(const std::vector<uint8_t>& in, std::vector<uint8_t>& out);
@@ -15,12 +15,12 @@ void ComputeSHA1Digest(const std::vector<uint8_t>& in, std::vector<uint8_t>& out
 // 32 bytes.
 void ComputeSHA256Digest(const std::vector<uint8_t>& in, std::vector<uint8_t>& out);
 
-// The digests that a signature may be over. Which of them it is, the signature itself tells.
+// The digests that a signature may be made over. The signature itself names the one that counts.
 struct Digests {
   std::vector<uint8_t> sha1;
   std::vector<uint8_t> sha256;
   std::vector<uint8_t> md5;
 };
 
-// All three of `in`.
+// Computes all three digests of `in`.
 Digests ComputeDigests(const std::vector<uint8_t>& in);

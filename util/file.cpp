@@ -13,7 +13,7 @@
 
 namespace {
 
-// The link in /proc that leads to the file that `fd` is open on, whatever its path leads to now.
+// The link in /proc to the file that is open as `fd`. It still leads there if the path does not.
 std::string DescriptorLink(int fd) { return "/proc/self/fd/" + std::to_string(fd); }
 
 ssize_t FindSize(int fd, struct stat* state);
@@ -32,7 +32,7 @@ int OpenForReading(const char* path, int flags) {
   const int fd = open(path, O_RDONLY | O_NONBLOCK | flags);
   if (fd >= 0 || errno != EWOULDBLOCK) return fd;
   // Another process holds a lease. The holder must not get the time to put a FIFO in the file's
-  // place, so the file is pinned first, and opened through its descriptor.
+  // place. An O_PATH descriptor therefore pins the file first, and the file is opened through it.
   const ScopedFd pinned(open(path, O_PATH | O_CLOEXEC));
   struct stat state = {};
   if (pinned.get() < 0 || fstat(pinned.get(), &state) != 0 || !S_ISREG(state.st_mode)) return -1;
@@ -54,8 +54,8 @@ bool ReadFile(const std::string& path, std::vector<uint8_t>& out, struct stat* s
   }
   if (out.empty() && out.capacity() < static_cast<size_t>(size)) std::vector<uint8_t>().swap(out);
   out.resize(static_cast<size_t>(size));
-  // Deliberate: a file that shrinks meanwhile is no failure. It leaves the end of `out` as it is,
-  // whose digest, which every caller takes, then is not the expected one.
+  // Deliberate: reading succeeds even if the file shrinks meanwhile. The end of `out` then keeps
+  // its old bytes. Every caller takes the digest of `out`, and that digest does not match.
   ReadBytes(fd, out);
   if (state != nullptr) *state = found;
   return true;
@@ -71,8 +71,8 @@ std::vector<uint8_t> StringToVector(const std::string& s) { return {s.begin(), s
 
 namespace {
 
-// The size in bytes of the regular file `fd`, whose position is then its start again, and its state
-// before. -1 if there is no such size, or none that fits in memory.
+// Returns the size of the regular file `fd` in bytes, its state in `state`, and the position at the
+// start. Returns -1 if `fd` is not a regular file, cannot seek, or does not fit in memory.
 ssize_t FindSize(int fd, struct stat* state) {
   if (fstat(fd, state) != 0 || !S_ISREG(state->st_mode)) return -1;
   const off_t size = lseek(fd, 0, SEEK_END);
@@ -80,7 +80,7 @@ ssize_t FindSize(int fd, struct stat* state) {
   return lseek(fd, 0, SEEK_SET) == 0 ? size : -1;
 }
 
-// Fills `out` from `fd`, as far as there is something to read.
+// Fills `out` from `fd` until the file ends or cannot be read.
 void ReadBytes(int fd, std::vector<uint8_t>& out) {
   size_t done = 0;
   while (done < out.size()) {

@@ -1,6 +1,6 @@
-// The tool's one way to the Android log: every line carries the tag "ApkToolkit" and one of two
-// priorities. The printf attribute lets the compiler check each message against its arguments.
-// Nothing is allocated, and errno is the same after a call as before it.
+// The tool writes to the Android log only through these functions. Every line has the tag
+// "ApkToolkit" and one of two priorities. The printf attribute lets the compiler check each message
+// against its arguments. The functions allocate nothing and preserve errno.
 #pragma once
 
 #include <android/log.h>
@@ -11,8 +11,8 @@
 
 inline constexpr char kLogTag[] = "ApkToolkit";
 
-// The log keeps at most this many bytes of a record's text, the closing NUL included, and cuts what
-// is longer.
+// The log keeps at most this many bytes of a record's text, including the closing NUL. It cuts
+// longer texts.
 inline constexpr size_t kLogTextSize = 1024;
 
 // Writes one record with `priority` (an android_LogPriority). `format` and `arguments` as for

@@ -1,10 +1,10 @@
-// What memory there is. Nothing is kept, nothing is logged.
+// How much memory can be had. The function keeps no state and logs nothing.
 #pragma once
 
 #include <cstddef>
 
-// Whether a vector may grow to `size` bytes. The vector itself cannot be asked: it ends the process
-// where it cannot grow. A sparse file and a zip bomb claim any size for nothing, and a kernel that
-// promises more memory than there is would end the process later, so the memory of the machine is
-// the limit, and the address space is tried.
+// True if a vector can grow to `size` bytes. A vector that cannot grow ends the process, so the
+// caller asks here first. Sparse files and zip bombs can claim any size. A kernel that overcommits
+// would end the process later, so `size` must be below the machine's memory; a trial mapping checks
+// the address space.
 bool FitsInMemory(size_t size);

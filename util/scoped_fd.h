@@ -5,7 +5,7 @@
 
 class ScopedFd {
  public:
-  // Takes over `fd`; a negative one is none.
+  // Takes ownership of `fd`. A negative `fd` is not closed.
   explicit ScopedFd(int fd) : fd_(fd) {}
   ~ScopedFd() {
     if (fd_ >= 0) close(fd_);

@@ -1,4 +1,4 @@
-// Byte-wise questions about texts.
+// Compares texts byte by byte.
 #pragma once
 
 #include <string_view>

@@ -4,8 +4,8 @@
 
 namespace {
 
-// In the order of their numbers, from 1 on, as Linux numbers them on Arm and x86. "-" is a number
-// without a name; of two names for a number this is the kernel's.
+// The names from error number 1 on, as Linux numbers them on Arm and x86. "-" stands for a number
+// without a name. If a number has two names, this is the kernel's.
 constexpr char kNames[] =
     "EPERM ENOENT ESRCH EINTR EIO ENXIO E2BIG ENOEXEC EBADF ECHILD EAGAIN ENOMEM EACCES EFAULT "
     "ENOTBLK EBUSY EEXIST EXDEV ENODEV ENOTDIR EISDIR EINVAL ENFILE EMFILE ENOTTY ETXTBSY EFBIG "

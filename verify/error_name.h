@@ -1,8 +1,8 @@
-// The names of error numbers, such as "ENOKEY" for 126. The C library has a function for that, but
-// not yet at API level 27. Nothing is kept, and the texts live as long as the process.
+// The names of error numbers, such as "ENOKEY" for 126. The C library of API level 27 has no
+// function for that. The function keeps no state, and its texts live as long as the process.
 #pragma once
 
 #include <string_view>
 
-// The name of the error number `error`, which may be any number; "-" where it has none.
+// The name of `error`, which may be any number; "-" if the number has no name.
 std::string_view ErrorName(int error);

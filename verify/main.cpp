@@ -1,7 +1,7 @@
-// apktoolkit-verify: asks the kernel of each file whether it trusts it, and prints a line a file.
-// Nothing is read of the file, nothing is logged, and the answer is the kernel's alone. The exit
-// status: 0 all are trusted, 1 one is not or cannot be opened, 2 the command line is wrong or the
-// output could not be written.
+// apktoolkit-verify asks the kernel whether it trusts each file, and prints one line per file. It
+// reads no bytes of a file and logs nothing: the answer is the kernel's alone. Exit status: 0 if
+// all files are trusted; 1 if a file is not trusted or cannot be opened; 2 if the command line is
+// wrong or the output cannot be written.
 #include <fcntl.h>
 #include <sys/stat.h>
 #include <unistd.h>
@@ -41,7 +41,7 @@ int main(int argc, char* argv[]) {
 
 namespace {
 
-// At least one file; there are no options, and none may pass for a file.
+// True for at least one file and no options: the program has none, and takes none for a file.
 bool IsCommandLineRight(int argc, char* argv[]) {
   for (int i = 1; i < argc; ++i) {
     if (argv[i][0] == '-') return false;
@@ -49,7 +49,7 @@ bool IsCommandLineRight(int argc, char* argv[]) {
   return argc > 1;
 }
 
-// Opens the file without waiting, should it be a FIFO or be leased.
+// Opens the file without waiting, even if it is a FIFO or is leased.
 bool IsTrusted(const char* path) {
   PrintPath(path);
   const int fd = open(path, O_RDONLY | O_NONBLOCK | O_NOCTTY | O_CLOEXEC);
@@ -62,8 +62,8 @@ bool IsTrusted(const char* path) {
   return is_trusted;
 }
 
-// The kernel fixes the bytes of regular files; what it says of others means nothing, so it is not
-// asked.
+// The kernel fixes the bytes of regular files only. Its answer for other files means nothing, so it
+// is not asked.
 bool AskKernel(int fd) {
   struct stat state = {};
   if (fstat(fd, &state) != 0 || !S_ISREG(state.st_mode)) {
@@ -78,8 +78,8 @@ bool AskKernel(int fd) {
   return true;
 }
 
-// A path may hold anything but NUL. What would end the line, or a terminal would obey, is printed
-// as \xHH, and so is the backslash.
+// A path may hold any byte but NUL. Control characters and the backslash are printed as \xHH, so
+// that a path cannot end the line or command a terminal.
 void PrintPath(const char* path) {
   for (; *path != '\0'; ++path) {
     const auto byte = static_cast<unsigned char>(*path);

@@ -1,8 +1,8 @@
-# 64-bit Arm, API level 27, with any clang and lld and a sysroot of your own, given as
-# -DCMAKE_SYSROOT=DIR: the C and C++ libraries of the target, and the platform libraries where
-# -DPLATFORM_INCLUDE_DIR and -DPLATFORM_LIBRARY_DIR say (docs/porting.md).
+# 64-bit Arm, API level 27, with any clang and lld and your own sysroot. -DCMAKE_SYSROOT=DIR names
+# the sysroot, with the target's C and C++ libraries. -DPLATFORM_INCLUDE_DIR and
+# -DPLATFORM_LIBRARY_DIR name the platform libraries (docs/porting.md).
 #
-# The system is called Linux, since CMake's own idea of Android asks for an NDK.
+# The system is called Linux, because CMake's own support for Android asks for an NDK.
 set(CMAKE_SYSTEM_NAME Linux)
 set(CMAKE_SYSTEM_PROCESSOR aarch64)
 
@@ -11,7 +11,7 @@ if(NOT CMAKE_SYSROOT)
   message(FATAL_ERROR "The android preset needs -DCMAKE_SYSROOT=DIR, see docs/porting.md")
 endif()
 set(CMAKE_TRY_COMPILE_PLATFORM_VARIABLES CMAKE_SYSROOT)
-# A sysroot may have the libraries and not the objects that a program starts with.
+# A sysroot may have the libraries but lack the start files of programs.
 set(CMAKE_TRY_COMPILE_TARGET_TYPE STATIC_LIBRARY)
 
 if(NOT CMAKE_CXX_COMPILER)
@@ -20,8 +20,8 @@ if(NOT CMAKE_CXX_COMPILER)
 endif()
 set(CMAKE_CXX_COMPILER_TARGET aarch64-linux-android27)
 set(CMAKE_LIBRARY_ARCHITECTURE aarch64-linux-android)
-# The platform's C++ library is libc++, which not every clang takes for this target by itself. Some
-# phones have pages of 16 KiB; what is laid out for those runs on all.
+# The platform's C++ library is libc++. Not every clang chooses it for this target by itself. Some
+# phones have pages of 16 KiB; a program linked for those runs on all phones.
 set(CMAKE_CXX_FLAGS_INIT "-stdlib=libc++")
 set(CMAKE_EXE_LINKER_FLAGS_INIT "-fuse-ld=lld -Wl,-z,max-page-size=16384")
 set(CMAKE_SHARED_LINKER_FLAGS_INIT "-fuse-ld=lld -Wl,-z,max-page-size=16384")

@@ -1,5 +1,5 @@
-# 64-bit Arm with Debian's cross compiler and the libraries that scripts/arm64-sysroot unpacked;
-# what is built runs on this machine under qemu's user emulation.
+# 64-bit Arm with Debian's cross compiler and the libraries that scripts/arm64-sysroot unpacked. The
+# programs run on this machine under qemu's user emulation.
 set(CMAKE_SYSTEM_NAME Linux)
 set(CMAKE_SYSTEM_PROCESSOR aarch64)
 

@@ -1,10 +1,10 @@
-// apktoolkit-all DIRECTORY LIST: has every installed package signed, after an update of the system.
-// The file LIST has a line "DIGEST[,DIGEST]... PATH" for each, as the package manager knows their
-// signers (SignerDigests.java); what came of each is printed. DIRECTORY is where the programs lie:
-// /system/bin.
+// apktoolkit-all DIRECTORY LIST: signs every installed package after an update of the system. The
+// file LIST has a line "DIGEST[,DIGEST]... PATH" for each package, with its signers as the package
+// manager knows them (SignerDigests.java). DIRECTORY contains the programs: /system/bin. The
+// outcome for each package is printed.
 //
-// It passes over files that the kernel trusts already. A run that was cut off can be started again.
-// The exit status: 0 all are trusted, 1 some are not, 2 the command line or the list is wrong.
+// Files that the kernel already trusts are left out, so an interrupted run can be started again.
+// Exit status: 0 all are trusted, 1 some are not, 2 the command line or the list is wrong.
 #include <algorithm>
 #include <cerrno>
 #include <cstdio>
@@ -20,7 +20,7 @@ constexpr int kAllTrusted = 0;
 constexpr int kNotAllTrusted = 1;
 constexpr int kWrongInput = 2;
 
-// The next line without its end; false at the end of the file.
+// Reads the next line without its end. Returns false at the end of the file.
 bool ReadLine(FILE* list, std::string* line) {
   char* text = nullptr;
   size_t size = 0;
@@ -31,7 +31,7 @@ bool ReadLine(FILE* list, std::string* line) {
   return length > 0;
 }
 
-// The signers may be none; the path is absolute, and may have blanks.
+// The list of signers may be empty. The path is absolute and may contain blanks.
 bool Parse(const std::string& line, InstalledPackage* package) {
   const size_t blank = line.find(' ');
   if (blank == std::string::npos || line.compare(blank, 2, " /") != 0) return false;
@@ -66,7 +66,7 @@ int main(int argc, char* argv[]) {
     const SignOutcome outcome = SignPackage(argv[1], package, RunLimits());
     if (!HasTrust(outcome)) status = std::max(status, kNotAllTrusted);
     printf("%s: %s\n", package.path.c_str(), Describe(outcome));
-    fflush(stdout);  // for whoever watches
+    fflush(stdout);  // show progress at once
   }
   fclose(list);
   return status;

@@ -12,15 +12,15 @@
 
 namespace {
 
-// Of a child that could not become the program. The kit's programs end with less.
+// The exit status of a child that could not exec the program. The kit's programs use lower numbers.
 constexpr int kCannotBecome = 127;
 
-// All that the child needs, made before the fork: the child of a process with several threads must
-// not take a lock, and so must not allocate.
+// Everything that the child needs, made before the fork. The child of a process with several
+// threads must not take a lock, so it must not allocate.
 struct Child {
   std::vector<char*> arguments;  // ends with a null pointer
   int null;                      // /dev/null, behind the standard streams
-  int descriptors;               // there is none from this number on
+  int descriptors;               // all descriptors are below this number
   rlim_t memory_bytes;
 };
 
@@ -57,8 +57,8 @@ std::vector<char*> Arguments(const std::vector<std::string>& command) {
   return arguments;
 }
 
-// Behind the standard streams also where this process has none of its own: what dup2 finds in its
-// place already would stay closed by exec.
+// Opens /dev/null above the standard streams, even if this process has none. dup2 onto the same
+// number would keep close-on-exec, and exec would close that stream.
 int OpenNull() {
   const int first = open("/dev/null", O_RDWR | O_CLOEXEC);
   if (first < 0) return first;
@@ -69,7 +69,7 @@ int OpenNull() {
   return null;
 }
 
-// The streams have to be open: the tool refuses a file that gets descriptor 0.
+// The standard streams must be open: the tool refuses a file that gets descriptor 0.
 void Become(const Child& child) {
   for (const int stream : {STDIN_FILENO, STDOUT_FILENO, STDERR_FILENO}) dup2(child.null, stream);
   for (int fd = STDERR_FILENO + 1; fd < child.descriptors; ++fd) close(fd);
@@ -84,7 +84,7 @@ void Become(const Child& child) {
 
 RunResult Wait(pid_t child, int milliseconds) {
   constexpr long long kLongestNap = 50;
-  const long long deadline = Now() + milliseconds;
+  const long long deadline = Now() + milliseconds + 1;  // Now() is rounded down
   for (long long nap = 1;; nap = std::min(2 * nap, kLongestNap)) {
     int status = 0;
     const pid_t ended = waitpid(child, &status, WNOHANG);
@@ -109,7 +109,7 @@ RunResult Describe(int status) {
   return {RunEnd::kExited, WEXITSTATUS(status)};
 }
 
-// Milliseconds of a clock that nobody sets.
+// The milliseconds of a clock that nobody can set.
 long long Now() {
   timespec now = {};
   clock_gettime(CLOCK_MONOTONIC, &now);

@@ -4,7 +4,7 @@
 
 namespace {
 
-// Statuses of apktoolkit-bound; others are the tool's.
+// Statuses of apktoolkit-bound. Other statuses are the tool's.
 constexpr int kStatusOtherSigner = 3;
 constexpr int kStatusNoJarSigner = 4;
 constexpr int kStatusNotStarted = 5;
@@ -14,7 +14,7 @@ bool IsTrusted(const std::string& directory, const std::string& path, const RunL
   return run.end == RunEnd::kExited && run.value == 0;
 }
 
-// Why the kernel does not trust the package after this run.
+// The reason why the kernel does not trust the package after this run.
 SignOutcome WhyNotTrusted(const RunResult& run) {
   switch (run.end) {
     case RunEnd::kTimedOut:
@@ -48,7 +48,7 @@ SignOutcome SignPackage(const std::string& directory, const InstalledPackage& pa
   const RunResult run = RunProgram({directory + "/apktoolkit-bound", package.signer_digests,
                                     directory + "/apktoolkit", package.path},
                                    limits);
-  // The exit status of the tool tells nothing about the file. The kernel does.
+  // The tool's exit status tells nothing about the file. Only the kernel knows.
   if (IsTrusted(directory, package.path, limits)) return SignOutcome::kTrusted;
   return WhyNotTrusted(run);
 }

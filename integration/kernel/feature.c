@@ -1,17 +1,17 @@
 // SPDX-License-Identifier: GPL-2.0-only OR Apache-2.0
 /*
- * The file-integrity feature on an ordinary kernel, for tests alone: the smallest form of what
- * apktoolkit asks of a kernel. NOT for a product: every task may have every file signed, and the
- * integrity value of every task is what a parameter says (README.md tells what a product needs).
+ * The file-integrity feature on an ordinary kernel, for tests alone: the smallest form that
+ * apktoolkit works with. NOT for a product: every task may have every file signed, and a parameter
+ * sets the integrity value of every task (README.md tells what a product needs).
  *
  *   fcntl(fd, 1124, payload)   signs: keeps the payload, and the SHA-256 digest of the file's
  *                              bytes, in an extended attribute of the file
  *   fcntl(fd, 1125)            verifies: 0 as long as the file has the bytes that were signed
  *   /proc/PID/integrity/value  the integrity value of a task, in hexadecimal
  *
- * No line of the kernel is changed. Kprobes send these two commands, and the look-up of "integrity"
- * below /proc/PID, to the functions below; everything else goes on as before. The module cannot be
- * unloaded, because /proc keeps inodes whose operations are here.
+ * The kernel itself is not changed. Kprobes redirect these two commands, and the look-up of
+ * "integrity" below /proc/PID, to the functions below; everything else works as before. The module
+ * cannot be unloaded, because /proc keeps inodes whose operations are here.
  */
 #include <crypto/sha2.h>
 #include <linux/file.h>
@@ -34,7 +34,7 @@ MODULE_LICENSE("GPL");
 #define SIGN_COMMAND 1124
 #define VERIFY_COMMAND 1125
 
-/* Only the kernel and the administrator set attributes of this class. */
+/* Only the kernel and the administrator can set attributes of this class. */
 #define ATTRIBUTE XATTR_SECURITY_PREFIX "integrity_stand_in"
 
 static char integrity[64] = "1f";
@@ -51,20 +51,20 @@ MODULE_PARM_DESC(verify_errno, "answer for a file that is not trusted");
 
 /* ---- The two commands. Functions return 0 or a negative error number. */
 
-/* A descriptor that only names a file (O_PATH) is none here. */
+/* False for a descriptor that only names a file (O_PATH). */
 static bool is_open(const struct file *file)
 {
 	return file && !(file->f_mode & FMODE_PATH);
 }
 
-/* What the attribute holds: a digest, and from the length on the payload as it was handed over. */
+/* The contents of the attribute: a digest, and then the payload as the task passed it. */
 struct signature {
 	u8 digest[SHA256_DIGEST_SIZE]; /* of the file's bytes */
 	u16 length; /* of the data, in host byte order */
 	u8 data[];
 } __packed;
 
-/* The caller frees the result. No byte is read twice: the task may write to them meanwhile. */
+/* The caller frees the result. No byte is read twice, because the task may change it meanwhile. */
 static struct signature *copy_payload(const u8 __user *payload)
 {
 	struct signature *signature;
@@ -82,7 +82,7 @@ static struct signature *copy_payload(const u8 __user *payload)
 	return ERR_PTR(-EFAULT);
 }
 
-/* A product fixes the bytes instead: here they may change between this and their use. */
+/* A product fixes the bytes. Here they may change between the digest and their use. */
 static int digest_file(struct file *file, u8 digest[SHA256_DIGEST_SIZE])
 {
 	struct sha256_state state;
@@ -172,7 +172,7 @@ static int verify(int fd, struct file *file)
 	return error;
 }
 
-/* In the place of the system call fcntl, for the two commands alone. */
+/* Replaces the system call fcntl, for the two commands alone. */
 static asmlinkage long integrity_fcntl(struct pt_regs *call)
 {
 	unsigned long arguments[6];
@@ -192,13 +192,13 @@ static asmlinkage long integrity_fcntl(struct pt_regs *call)
 
 /* ---- /proc/PID/integrity/value */
 
-/* The caller frees the result: the first of the texts, which goes away unless it is the last. */
+/* Takes the first text off the list, unless it is the last one. The caller frees the result. */
 static char *take_text(void)
 {
 	char *text, *comma;
 
 	kernel_param_lock(THIS_MODULE);
-	strim(integrity); /* of the line end that echo wrote */
+	strim(integrity); /* echo writes a line end */
 	comma = strchrnul(integrity, ',');
 	text = kmemdup_nul(integrity, comma - integrity, GFP_KERNEL);
 	if (*comma)
@@ -246,7 +246,7 @@ static const struct file_operations value_operations = {
 	.release = value_release,
 };
 
-/* The caller hands the inode on. */
+/* The caller passes the inode on. */
 static struct inode *new_node(struct inode *directory, umode_t mode)
 {
 	struct inode *inode = new_inode(directory->i_sb);
@@ -273,7 +273,7 @@ static struct dentry *look_up_value(struct inode *directory, struct dentry *dent
 
 static const struct inode_operations directory_operations = { .lookup = look_up_value };
 
-/* In the place of the look-up below /proc/PID, for the name "integrity" alone. */
+/* Replaces the look-up below /proc/PID, for the name "integrity" alone. */
 static struct dentry *look_up_integrity(struct inode *directory, struct dentry *dentry,
 					unsigned int flags)
 {
@@ -286,7 +286,7 @@ static struct dentry *look_up_integrity(struct inode *directory, struct dentry *
 	return d_splice_alias(inode, dentry); /* or the inode's error */
 }
 
-/* ---- The two places in the kernel. What is entered there runs as the function above instead. */
+/* ---- The two kernel functions that are entered. Each call continues in a function above instead. */
 
 static int fcntl_entered(struct kprobe *probe, struct pt_regs *registers)
 {
@@ -309,7 +309,7 @@ static int look_up_entered(struct kprobe *probe, struct pt_regs *registers)
 	return 1;
 }
 
-/* Where there is one, the kernel does not optimise the probe into a jump, which leads nowhere else. */
+/* A post handler keeps the kernel from optimising the probe into a jump, which cannot redirect. */
 static void after(struct kprobe *probe, struct pt_regs *registers, unsigned long flags)
 {
 }

@@ -23,7 +23,7 @@ int journal_open(void)
 
 static __printf(1, 2) void write_line(const char *format, ...)
 {
-	loff_t end = 0; /* where it is, O_APPEND finds out */
+	loff_t end = 0; /* O_APPEND sets the position */
 	va_list arguments;
 	char *line;
 
@@ -37,7 +37,7 @@ static __printf(1, 2) void write_line(const char *format, ...)
 	kfree(line);
 }
 
-/* The path goes as it is into the line: paths of the tests have nothing to escape. */
+/* The path is not escaped: paths of the tests need no escapes. */
 static void write_answer(const char *event, int fd, struct file *file, const char *payload,
 			 int error)
 {
@@ -71,7 +71,7 @@ void journal_integrity(struct file *value, const char *text)
 	const char *quote = text ? "\"" : "";
 	int pid = 0;
 
-	/* As in the simulator's journal, 0 is the task that looks, by whatever name. */
+	/* As in the simulator's journal, 0 stands for the reading task itself, by either name. */
 	if (kstrtoint(task, 10, &pid) || pid == task_tgid_vnr(current))
 		pid = 0;
 	write_line("{\"event\":\"integrity\",\"pid\":%d,\"text\":%s%s%s}\n", pid, quote,

@@ -15,21 +15,21 @@ import java.util.LinkedHashSet;
 import java.util.Set;
 
 /**
- * The package manager's side of binding the signers: who signed a package, in the form in which
- * apktoolkit names a signer to the kernel. Belongs into the process that installs.
+ * The package manager's side of binding the signers: names a package's signers in the form in which
+ * apktoolkit names a signer to the kernel. Use it in the process that installs.
  *
- * <p>The package manager goes by the newest signing block that it knows, apktoolkit by the JAR
- * signature. Only a package whose JAR signer is one of these may be given to apktoolkit: have
- * apktoolkit-bound compare, or call {@link #isAmong}.
+ * <p>The package manager uses the newest signing block that it knows, apktoolkit the JAR signature.
+ * Pass a package to apktoolkit only if its JAR signer is one of these signers: run apktoolkit-bound,
+ * or call {@link #isAmong}.
  */
 public final class SignerDigests {
     private SignerDigests() {}
 
     /**
      * The signers of an installed package from API level 28 on
-     * ({@code PackageManager.GET_SIGNING_CERTIFICATES}): those of its present content. Earlier keys
-     * of a package whose key was rotated are left out on purpose. A retired key may be in other
-     * hands, and a payload names the key and not the package.
+     * ({@code PackageManager.GET_SIGNING_CERTIFICATES}): those of its present content. If the key was
+     * rotated, earlier keys are left out on purpose. A retired key may be in other hands, and a
+     * payload names the key and not the package.
      */
     public static String of(SigningInfo info) throws CertificateException {
         return of(info.getApkContentsSigners());
@@ -39,8 +39,8 @@ public final class SignerDigests {
      * The same for API level 27 ({@code PackageInfo.signatures}, {@code PackageManager.GET_SIGNATURES}).
      *
      * @return the SHA-256 digest of each signer's RSA modulus, in lower-case hexadecimal, with commas
-     *     between. Keys of other kinds have none: a JAR signature with them does not hold for
-     *     apktoolkit. Empty where no signer has an RSA key.
+     *     between. Keys of other kinds have no digest: apktoolkit does not accept their signatures.
+     *     Empty if no signer has an RSA key.
      */
     public static String of(Signature[] signers) throws CertificateException {
         CertificateFactory factory = CertificateFactory.getInstance("X.509");
@@ -56,12 +56,12 @@ public final class SignerDigests {
         return String.join(",", digests);
     }
 
-    /** Whether the JAR signer is one of the signers; {@code digests} is what {@link #of} returned. */
+    /** True if the JAR signer is one of the signers; {@code digests} is the result of {@link #of}. */
     public static boolean isAmong(String digests, String jarSigner) {
         return !jarSigner.isEmpty() && Arrays.asList(digests.split(",")).contains(jarSigner);
     }
 
-    /** As in a payload: of the modulus's bytes, highest first, without zeros before them. */
+    /** The digest as in a payload: of the modulus's bytes, highest first, without leading zeros. */
     private static String digestOf(BigInteger modulus) {
         byte[] bytes = modulus.toByteArray();
         int sign = bytes[0] == 0 ? 1 : 0;

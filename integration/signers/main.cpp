@@ -1,12 +1,12 @@
-// apktoolkit-bound DIGESTS COMMAND... FILE: runs `COMMAND... FILE` if the package FILE has the JAR
-// signer that the package manager knows, and ends with a status of its own if not.
+// apktoolkit-bound DIGESTS COMMAND... FILE: runs `COMMAND... FILE` if the package manager knows the
+// JAR signer of the package FILE. Otherwise it ends with an exit status of its own.
 //
-// The package manager goes by the newer signing block and apktoolkit by the JAR signature, and
-// nobody else compares the two (docs/threat-model.md, "Before you ship it"). DIGESTS is what
-// SignerDigests.java makes of the package manager's signers: the SHA-256 digest of each RSA
-// modulus, in lower-case hexadecimal, with commas between. The JAR's signer is taken by the tool's
-// own code, so that both mean the same one. A package is looked at in a process of its own, because
-// the tool's code ends the process where there is no memory, and does not give everything back.
+// The package manager uses the newer signing block and apktoolkit the JAR signature. Nobody else
+// compares the two (docs/threat-model.md, "Before you ship it"). DIGESTS comes from
+// SignerDigests.java: the SHA-256 digest of the RSA modulus of each of the package manager's
+// signers, in lower-case hexadecimal, with commas between. The tool's own code finds the JAR's
+// signer, so that both mean the same one. Each package is read in a child process, because the
+// tool's code ends the process if memory runs out, and does not free everything.
 #include <fcntl.h>
 #include <unistd.h>
 
@@ -24,14 +24,15 @@
 
 namespace {
 
-// Beside those of the command, which is apktoolkit with its 0 and 1.
+// The command's own statuses, apktoolkit's 0 and 1, are left free.
 constexpr int kUsageError = 2;
 constexpr int kOtherSigner = 3;
 constexpr int kNoJarSigner = 4;
 constexpr int kNotStarted = 5;
 
-// The digest of the key whose signatures over the signature file and over its own certificate hold,
-// or nothing where there is none. The tool makes its payload of the same.
+// Returns the digest of the signer's key if that key's signatures over the signature file and over
+// its own certificate are good, and otherwise an empty text. The tool makes its payload of the same
+// digest.
 std::string JarSigner(const char* file) {
   const ScopedFd fd(OpenForReading(file, O_CLOEXEC));
   if (fd.get() < 0) return {};
@@ -48,7 +49,7 @@ std::string JarSigner(const char* file) {
   return digits;
 }
 
-// True if `wanted` is one of the words between the commas.
+// True if `wanted` is one of the comma-separated words.
 bool IsAmong(std::string_view words, std::string_view wanted) {
   while (true) {
     const size_t comma = words.find(',');

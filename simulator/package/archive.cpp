@@ -73,12 +73,22 @@ bool Archive::Has(const std::string& name) const {
 }
 
 Archive::ReadResult Archive::Read(const std::string& name, std::vector<uint8_t>* content) {
+  const ReadResult result = ReadUpTo(kLongestRead, name, content);
+  if (result == ReadResult::kTooLong) too_long_.push_back(name);
+  return result;
+}
+
+Archive::ReadResult Archive::ReadToCompare(const std::string& name,
+                                           std::vector<uint8_t>* content) const {
+  return ReadUpTo(kLongestCompared, name, content);
+}
+
+Archive::ReadResult Archive::ReadUpTo(uint32_t most, const std::string& name,
+                                      std::vector<uint8_t>* content) const {
   ZipEntry entry;
   const int32_t found = ApkTools::FindZipEntry(handle_, name, &entry);
   if (IsMissing(found)) return ReadResult::kMissing;
-  if (found == 0 && entry.uncompressed_length > kLongestRead &&
-      ApkTools::IsPlausibleLength(entry)) {
-    too_long_.push_back(name);
+  if (found == 0 && entry.uncompressed_length > most && ApkTools::IsPlausibleLength(entry)) {
     return ReadResult::kTooLong;
   }
   std::vector<uint8_t> extracted;

@@ -48,6 +48,9 @@ class Archive {
   // Longer entries are not read to explain anything, in bytes.
   static constexpr uint32_t kLongestRead = 64 << 20;
 
+  // Longer entries are not compared with the manifest, in bytes.
+  static constexpr uint32_t kLongestCompared = 512 << 20;
+
   enum class ReadResult { kRead, kMissing, kDamaged, kTooLong };
 
   // Opens the file that is open as `fd` and stays so as long as this object lives. `result` is the
@@ -65,6 +68,8 @@ class Archive {
   bool Has(const std::string& name) const;
   // The whole entry as the tool extracts it. `content` is changed by kRead alone.
   ReadResult Read(const std::string& name, std::vector<uint8_t>* content);
+  // The same for longer ones, up to kLongestCompared; too_long() does not name them.
+  ReadResult ReadToCompare(const std::string& name, std::vector<uint8_t>* content) const;
   // Those that were too long to be read so far.
   const std::vector<std::string>& too_long() const { return too_long_; }
   // The entry, part by part, until `take` answers false. False when it did not come to its end.
@@ -74,6 +79,8 @@ class Archive {
   bool HasShrunk() const { return guard_.HasShrunk(); }
 
  private:
+  ReadResult ReadUpTo(uint32_t most, const std::string& name, std::vector<uint8_t>* content) const;
+
   const ShrinkGuard guard_;
   const int fd_;
   ZipArchiveHandle handle_ = nullptr;

@@ -37,11 +37,15 @@ std::vector<ArchiveEntry> ReadDirectory(int fd, const ArchiveEnd& end) {
   uint64_t offset = end.directory_offset;
   while (entries.size() < end.entry_count) {
     const std::string record = ReadAt(fd, offset, kRecordSize);
-    // Mark, sixteen bytes, the two sizes, the lengths of the three parts behind the record.
+    constexpr uint16_t kEncrypted = 1;  // APPNOTE.TXT 4.4.4, bit 0
+    // Mark, two versions, flags, ten bytes, the two sizes, the lengths of the three parts behind
+    // the record.
     CBS fields = ToCbs(record);
     uint32_t size = 0;
+    uint16_t flags = 0;
     uint16_t name_size = 0, extra_size = 0, comment_size = 0;
-    if (record.compare(0, 4, kMark) != 0 || !CBS_skip(&fields, 20) ||
+    if (record.compare(0, 4, kMark) != 0 || !CBS_skip(&fields, 8) ||
+        !CBS_get_u16le(&fields, &flags) || !CBS_skip(&fields, 10) ||
         !CBS_get_u32le(&fields, &size) || !CBS_skip(&fields, 4) ||
         !CBS_get_u16le(&fields, &name_size) || !CBS_get_u16le(&fields, &extra_size) ||
         !CBS_get_u16le(&fields, &comment_size)) {
@@ -49,7 +53,7 @@ std::vector<ArchiveEntry> ReadDirectory(int fd, const ArchiveEnd& end) {
     }
     std::string name = ReadAt(fd, offset + kRecordSize, name_size);
     if (name.size() < name_size) break;
-    entries.push_back({std::move(name), size, false});
+    entries.push_back({std::move(name), size, false, (flags & kEncrypted) != 0});
     offset += kRecordSize + name_size + uint64_t{extra_size} + comment_size;
   }
   return entries;

@@ -21,6 +21,7 @@ struct ArchiveEntry {
   std::string name;  // any bytes
   uint64_t size;     // what its data takes in the archive, in bytes
   bool is_damaged;   // the platform's library does not find it
+  bool is_encrypted = false;
 };
 
 // The end record of the file that is open as `fd`, by the last of its marks; none when it has none.

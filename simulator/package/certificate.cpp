@@ -11,6 +11,8 @@
 
 #include <algorithm>
 #include <cctype>
+#include <filesystem>
+#include <fstream>
 
 #include "simulator/phone/text.h"
 
@@ -19,6 +21,7 @@ namespace simulator {
 namespace {
 
 PublicKey ReadKey(X509* certificate);
+std::optional<int64_t> SecondsOf(const ASN1_TIME* time);
 std::string IssuerAndSerial(const X509* certificate);
 std::string Text(const uint8_t* bytes, int size);
 std::string NameText(const X509_NAME* name);
@@ -44,11 +47,14 @@ std::optional<CertificateFacts> ParseCertificate(std::string_view der) {
   facts.subject = NameText(subject);
   facts.issuer = NameText(issuer);
   facts.is_self_issued = X509_NAME_cmp(subject, issuer) == 0;
-  facts.sha256 = Sha256Hex(der.substr(0, static_cast<size_t>(end - start)));
+  der = der.substr(0, static_cast<size_t>(end - start));
+  facts.sha256 = Sha256Hex(der);
+  facts.sha1 = Sha1Hex(der);
   facts.signature_algorithm = SignatureName(algorithm);
   const int nid = OBJ_obj2nid(algorithm);
   facts.has_known_digest = nid == NID_md5WithRSAEncryption || nid == NID_sha1WithRSAEncryption ||
                            nid == NID_sha256WithRSAEncryption;
+  facts.not_after = SecondsOf(X509_get0_notAfter(certificate.get()));
   facts.key = ReadKey(certificate.get());
   facts.issuer_and_serial = IssuerAndSerial(certificate.get());
   if (const ASN1_OCTET_STRING* const id = X509_get0_subject_key_id(certificate.get())) {
@@ -75,9 +81,34 @@ AlgorithmFacts ParseAlgorithm(std::string_view der) {
   return AlgorithmOf(algorithm);
 }
 
+std::string Sha1Hex(std::string_view bytes) {
+  uint8_t digest[SHA_DIGEST_LENGTH];
+  SHA1(reinterpret_cast<const uint8_t*>(bytes.data()), bytes.size(), digest);
+  return HexText({reinterpret_cast<const char*>(digest), sizeof(digest)});
+}
+
 std::string Sha256Hex(std::string_view bytes) {
+  Sha256 digest;
+  digest.Add(bytes);
+  return digest.Hex();
+}
+
+std::string FileSha256(const std::string& path) {
+  std::error_code error;
+  if (!std::filesystem::is_regular_file(path, error)) return {};
+  std::ifstream file(path, std::ios::binary);
+  if (!file) return {};
+  Sha256 digest;
+  std::string part(1 << 20, '\0');
+  while (file.read(part.data(), static_cast<std::streamsize>(part.size())) || file.gcount() > 0) {
+    digest.Add({part.data(), static_cast<size_t>(file.gcount())});
+  }
+  return file.bad() ? std::string() : digest.Hex();
+}
+
+std::string Sha256::Hex() {
   uint8_t digest[SHA256_DIGEST_LENGTH];
-  SHA256(reinterpret_cast<const uint8_t*>(bytes.data()), bytes.size(), digest);
+  SHA256_Final(digest, &state_);
   return HexText({reinterpret_cast<const char*>(digest), sizeof(digest)});
 }
 
@@ -103,6 +134,16 @@ PublicKey ReadKey(X509* certificate) {
     key.modulus_sha256 = Sha256Hex(modulus);
   }
   return key;
+}
+
+// The library compares times, whatever their form.
+std::optional<int64_t> SecondsOf(const ASN1_TIME* time) {
+  constexpr int64_t kSecondsOfDay = 86'400;
+  const bssl::UniquePtr<ASN1_TIME> start(ASN1_TIME_set(nullptr, 0));
+  int days = 0;
+  int seconds = 0;
+  if (start == nullptr || ASN1_TIME_diff(&days, &seconds, start.get(), time) == 0) return {};
+  return days * kSecondsOfDay + seconds;
 }
 
 // The last first; of one RelativeDistinguishedName, which mostly is one attribute, in their order.

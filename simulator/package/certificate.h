@@ -2,8 +2,10 @@
 // --print-certs` prints. Read by the platform's crypto library; nothing is verified.
 #pragma once
 
+#include <openssl/sha.h>
 #include <openssl/x509.h>
 
+#include <cstdint>
 #include <optional>
 #include <string>
 #include <string_view>
@@ -24,9 +26,12 @@ struct CertificateFacts {
   std::string issuer;
   bool is_self_issued = false;  // issuer and subject are the same name
   std::string sha256;           // of the whole certificate
+  std::string sha1;             // of the same, for stores that name a signer by it
   // What it is signed with, such as "SHA384withRSA".
   std::string signature_algorithm;
   bool has_known_digest = false;  // it is signed with RSA PKCS#1 v1.5 over MD5, SHA-1 or SHA-256
+  // The last second at which it is valid, counted since 1970 in UTC; none: it does not read.
+  std::optional<int64_t> not_after;
   PublicKey key;
   // The contents of the two SignerIdentifiers by which a signature can name the certificate: issuer
   // and serial number, and the subject key identifier, which may be empty.
@@ -46,7 +51,22 @@ AlgorithmFacts AlgorithmOf(const ASN1_OBJECT* algorithm);
 // Of an AlgorithmIdentifier; nothing where it does not read.
 AlgorithmFacts ParseAlgorithm(std::string_view der);
 
-// The SHA-256 digest in lower-case hexadecimal.
+// The digest in lower-case hexadecimal.
+std::string Sha1Hex(std::string_view bytes);
 std::string Sha256Hex(std::string_view bytes);
+// The same of a file's bytes; empty where it is no regular file that can be read.
+std::string FileSha256(const std::string& path);
+
+// The same of bytes that come in parts.
+class Sha256 {
+ public:
+  Sha256() { SHA256_Init(&state_); }
+  void Add(std::string_view bytes) { SHA256_Update(&state_, bytes.data(), bytes.size()); }
+  // To be called once, after the last part.
+  std::string Hex();
+
+ private:
+  SHA256_CTX state_;
+};
 
 }  // namespace simulator

@@ -3,17 +3,19 @@
 #include <fcntl.h>
 #include <sys/stat.h>
 #include <sys/statvfs.h>
+#include <unistd.h>
 
 #include <algorithm>
 #include <cerrno>
+#include <filesystem>
+#include <unordered_set>
 
 #include "apk/apk.h"
-#include "apk/entry_digests.h"
 #include "apk/native_libraries.h"
+#include "simulator/package/package_names.h"
 #include "simulator/package/signing_block.h"
 #include "util/file.h"
 #include "util/scoped_fd.h"
-#include "util/text.h"
 
 namespace simulator {
 
@@ -23,17 +25,18 @@ namespace {
 constexpr int kOpenFlags = O_RDONLY | O_CLOEXEC | O_NONBLOCK | O_NOCTTY;
 
 FileKind KindOf(int fd, uint64_t size);
+uint64_t CountPackages(const std::string& directory);
+std::string DigestOf(int fd, const IsLate& is_late);
 bool IsText(const std::string& start);
-void ReadArchive(int fd, PackageFacts* facts);
-void ListEntries(Archive* archive, PackageFacts* facts);
-bool IsSignatureName(const std::string& name);
+void ReadArchive(int fd, const IsLate& is_late, PackageFacts* facts);
+std::string FindEntryTwice(int fd);
 void FindLibraries(const Archive& archive, const std::string& path, PackageFacts* facts);
 LibraryFacts FindLibrary(const std::string& entry, const std::string& path);
 void ReadNewerSigners(int fd, PackageFacts* facts);
 
 }  // namespace
 
-PackageFacts LookAt(const std::string& path) {
+PackageFacts LookAt(const std::string& path, const IsLate& is_late) {
   PackageFacts facts;
   const ScopedFd file(open(path.c_str(), kOpenFlags));
   struct stat state = {};
@@ -45,12 +48,14 @@ PackageFacts LookAt(const std::string& path) {
   facts.is_read_only = fstatvfs(file.get(), &system) == 0 && (system.f_flag & ST_RDONLY) != 0;
   if (S_ISDIR(state.st_mode)) {
     facts.kind = FileKind::kDirectory;
+    facts.packages = CountPackages(path);
   } else if (!S_ISREG(state.st_mode)) {
     facts.kind = FileKind::kSpecial;
   } else {
     facts.size = static_cast<uint64_t>(state.st_size);
     facts.kind = KindOf(file.get(), facts.size);
-    if (facts.kind == FileKind::kArchive) ReadArchive(file.get(), &facts);
+    facts.sha256 = DigestOf(file.get(), is_late);
+    if (facts.kind == FileKind::kArchive) ReadArchive(file.get(), is_late, &facts);
   }
   return facts;
 }
@@ -76,6 +81,33 @@ FileKind KindOf(int fd, uint64_t size) {
   return IsText(start) ? FileKind::kText : FileKind::kNoArchive;
 }
 
+// Of as many of them as can be seen.
+uint64_t CountPackages(const std::string& directory) {
+  namespace fs = std::filesystem;
+  uint64_t count = 0;
+  std::error_code error;
+  for (fs::directory_iterator entry(directory, error); entry != fs::directory_iterator();
+       entry.increment(error)) {
+    count += IsPackageName(entry->path().string()) && !entry->is_directory(error) ? 1 : 0;
+  }
+  return count;
+}
+
+// Empty once it is late, and where the file cannot be read.
+std::string DigestOf(int fd, const IsLate& is_late) {
+  constexpr size_t kPart = 1 << 20;
+  Sha256 digest;
+  std::string part(kPart, '\0');
+  for (off_t offset = 0; !is_late();) {
+    const ssize_t size = pread(fd, part.data(), part.size(), offset);
+    if (size < 0) break;
+    if (size == 0) return digest.Hex();
+    digest.Add({part.data(), static_cast<size_t>(size)});
+    offset += size;
+  }
+  return {};
+}
+
 // No control characters but those that texts have.
 bool IsText(const std::string& start) {
   return std::all_of(start.begin(), start.end(), [](char c) {
@@ -84,14 +116,21 @@ bool IsText(const std::string& start) {
   });
 }
 
-void ReadArchive(int fd, PackageFacts* facts) {
+void ReadArchive(int fd, const IsLate& is_late, PackageFacts* facts) {
   Archive archive(fd, &facts->archive_result);
-  if (facts->archive_result != 0) return;
+  if (facts->archive_result != 0) {
+    facts->entry_twice = FindEntryTwice(fd);
+    return;
+  }
   std::vector<uint8_t> manifest;
   archive.Read(kAndroidManifestName, &manifest);
   facts->manifest = ParseAndroidManifest(manifest);
   facts->jar = ReadJarSignature(&archive);
-  ListEntries(&archive, facts);
+  std::vector<uint8_t> text;
+  facts->jar.manifest = archive.Read(ApkTools::Apk::kMANIFEST_MF, &text);
+  PackageEntries entries = CompareEntries(&archive, std::move(text), is_late);
+  facts->entries = std::move(entries.all);
+  facts->missing = std::move(entries.missing);
   FindLibraries(archive, GetFilenameByFd(fd), facts);
   facts->too_long = archive.too_long();
   if (facts->manifest.has_overlaps) facts->too_long.push_back(kAndroidManifestName);
@@ -99,28 +138,14 @@ void ReadArchive(int fd, PackageFacts* facts) {
   facts->was_changed = archive.HasShrunk();
 }
 
-void ListEntries(Archive* archive, PackageFacts* facts) {
-  std::vector<uint8_t> text;
-  facts->jar.manifest = archive->Read(ApkTools::Apk::kMANIFEST_MF, &text);
-  ApkTools::EntryDigests manifest;
-  manifest.Load(std::move(text));
-  manifest.List();
-  std::string digest_name, digest;
-  for (ArchiveEntry& entry : archive->Entries()) {
-    const bool is_listed = manifest.Find(entry.name, digest_name, digest);
-    const bool is_signature = IsSignatureName(entry.name);
-    facts->entries.push_back({std::move(entry), is_listed, is_signature});
+// The platform's library opens no archive that has one.
+std::string FindEntryTwice(int fd) {
+  const auto end = FindArchiveEnd(fd);
+  std::unordered_set<std::string> names;
+  for (const ArchiveEntry& entry : end ? ReadDirectory(fd, *end) : std::vector<ArchiveEntry>()) {
+    if (!names.insert(entry.name).second) return entry.name;
   }
-}
-
-// The manifest, signature files and their blocks, which no manifest lists.
-bool IsSignatureName(const std::string& name) {
-  constexpr std::string_view kDirectory = "META-INF/";
-  if (name == ApkTools::Apk::kMANIFEST_MF) return true;
-  if (name.compare(0, kDirectory.size(), kDirectory) != 0) return false;
-  if (name.find('/', kDirectory.size()) != std::string::npos) return false;
-  return EndsWith(name, ".SF") || EndsWith(name, ".RSA") || EndsWith(name, ".EC") ||
-         EndsWith(name, ".DSA");
+  return {};
 }
 
 // The tool's walk names all but the damaged ones.

@@ -11,6 +11,7 @@
 #include "simulator/package/android_manifest.h"
 #include "simulator/package/archive.h"
 #include "simulator/package/certificate.h"
+#include "simulator/package/entries.h"
 #include "simulator/package/jar_signature.h"
 
 namespace simulator {
@@ -32,12 +33,6 @@ struct NewerSignerFacts {
   CertificateFacts certificate;
 };
 
-struct ListedEntry {
-  ArchiveEntry entry;
-  bool is_listed;     // the manifest has a digest for it
-  bool is_signature;  // it belongs to a JAR signature itself
-};
-
 // A library lib/….so of the package, and what lies where the tool looks for it.
 struct LibraryFacts {
   std::string entry;  // its name in the package
@@ -55,8 +50,12 @@ struct PackageFacts {
   bool is_read_only = false;  // its file system is
   bool was_changed = false;   // while it was looked at
   uint64_t size = 0;          // of the file, in bytes
+  std::string sha256;         // of the file's bytes; empty: it was not read to its end
+  uint64_t packages = 0;      // of a directory: the files in it that have a package's name
   // The zip library's; 0: it is an archive, and what follows is filled.
   int32_t archive_result = -1;
+
+  std::string entry_twice;  // the first entry that stands in it again; empty: none does
 
   AndroidManifest manifest;
   JarSignatureFacts jar;
@@ -64,13 +63,16 @@ struct PackageFacts {
   bool has_damaged_signing_block = false;
   std::vector<std::string> too_long;  // what is there and was not looked into, for its length
   std::vector<ListedEntry> entries;
+  std::vector<std::string> missing;  // names that the manifest lists, and there is no such entry
   // In the order in which the tool walks through them, damaged ones last.
   std::vector<LibraryFacts> libraries;
 };
 
 // Looks at the file at `path`, and at the libraries beside it. Neither a pipe nor a device is read,
-// and nothing is waited for.
-PackageFacts LookAt(const std::string& path);
+// and nothing is waited for. Once `is_late` says so, no further entry is compared with the
+// manifest.
+PackageFacts LookAt(
+    const std::string& path, const IsLate& is_late = [] { return false; });
 
 // The names of the schemes after v1 that somebody signed with, each once, in the file's order.
 std::vector<std::string> NewerSchemes(const PackageFacts& facts);

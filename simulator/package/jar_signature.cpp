@@ -10,6 +10,7 @@
 #include "crypto/asn1.h"
 #include "crypto/pkcs7.h"
 #include "crypto/rsa.h"
+#include "simulator/package/entries.h"
 
 namespace simulator {
 
@@ -46,8 +47,10 @@ void ReadSignatureFile(Bytes text, JarSignatureFacts* jar) {
   const ManifestMf::Sections& sections = signature_file.getSections();
   if (sections.size() > 0) jar->claimed_schemes = sections[0].find("X-Android-APK-Signed");
   for (const ManifestMf::Section& section : sections) {
-    const bool has_one = !section.findLastEndingIn("-Digest-Manifest").first.empty();
-    jar->has_manifest_digest = jar->has_manifest_digest || has_one;
+    const std::string name(section.findLastEndingIn("-Digest-Manifest").first);
+    if (name.empty() || jar->has_manifest_digest) continue;
+    jar->has_manifest_digest = true;
+    jar->has_sha1_of_manifest = IsSha1Digest(name.substr(0, name.size() - strlen("-Manifest")));
   }
 }
 

@@ -29,8 +29,9 @@ struct JarSignatureFacts {
   Archive::ReadResult manifest = Archive::ReadResult::kMissing;  // META-INF/MANIFEST.MF
   // Those entries META-INF/*.SF, in the tool's order: it takes the first.
   std::vector<std::string> signature_files;
-  std::string claimed_schemes;       // X-Android-APK-Signed, such as "2, 3"; empty: not stated
-  bool has_manifest_digest = false;  // the signature file states one, of whatever kind
+  std::string claimed_schemes;        // X-Android-APK-Signed, such as "2, 3"; empty: not stated
+  bool has_manifest_digest = false;   // the signature file states one, of whatever kind
+  bool has_sha1_of_manifest = false;  // the one that the tool takes is a SHA-1 digest
   // The block that the tool looks for, "RSA"; or one of another kind of key, if that alone is
   // there.
   std::string block_name;

@@ -1,8 +1,11 @@
 #include "simulator/run/installation.h"
 
 #include <fcntl.h>
+#include <sys/stat.h>
+#include <sys/statvfs.h>
 #include <unistd.h>
 
+#include <algorithm>
 #include <cerrno>
 #include <climits>
 #include <cstdlib>
@@ -14,6 +17,7 @@
 #include "apk/native_libraries.h"
 #include "simulator/package/android_manifest.h"
 #include "simulator/package/archive.h"
+#include "simulator/phone/text.h"
 #include "util/scoped_fd.h"
 
 namespace simulator {
@@ -30,8 +34,9 @@ constexpr char kArm64Directory[] = "lib/arm64";
 using Layout = std::map<std::string, std::string>;
 
 std::vector<std::string> LibraryNames(const Archive& archive);
+bool LiesAlone(const std::string& file, int source, const std::vector<std::string>& libraries);
 Layout PlanLayout(const std::vector<std::string>& entries, InstalledAbi choice,
-                  std::vector<std::string>* left_out);
+                  std::vector<std::string>* left_out, std::set<std::string>* of_other_processors);
 bool IsNameForInstallers(const std::string& entry);
 bool Wants(InstalledAbi choice, bool is_arm64, bool has_arm64);
 bool PutPackage(const std::string& file, int source, const std::string& copy,
@@ -47,9 +52,10 @@ Installation::~Installation() {
   if (!directory_.empty()) fs::remove_all(directory_, error);
 }
 
-std::optional<std::string> Installation::LayOut(const std::string& file, InstalledAbi abi,
-                                                const Deadline& deadline) {
+std::optional<std::string> Installation::LayOut(const std::string& file, InstallWhen when,
+                                                InstalledAbi abi, const Deadline& deadline) {
   path_ = file;
+  if (when == InstallWhen::kNever) return {};
   std::error_code error;
   if (!fs::is_regular_file(file, error)) return {};
   const ScopedFd source(open(file.c_str(), O_RDONLY | O_CLOEXEC | O_NONBLOCK));
@@ -58,9 +64,11 @@ std::optional<std::string> Installation::LayOut(const std::string& file, Install
   Archive archive(source.get(), &result);
   if (result != 0) return {};
   std::vector<uint8_t> manifest;
-  archive.Read(kAndroidManifestName, &manifest);
+  if (archive.Read(kAndroidManifestName, &manifest) == Archive::ReadResult::kMissing) return {};
   if (ParseAndroidManifest(manifest).extracts_libraries == false) return {};
-  const Layout layout = PlanLayout(LibraryNames(archive), abi, &left_out_);
+  const std::vector<std::string> libraries = LibraryNames(archive);
+  if (when == InstallWhen::kAlone && !LiesAlone(file, source.get(), libraries)) return {};
+  const Layout layout = PlanLayout(libraries, abi, &left_out_, &of_other_processors_);
   if (layout.empty()) return {};
 
   std::string directory = fs::temp_directory_path(error).string() + "/apktoolkit-sim.XXXXXX";
@@ -68,23 +76,43 @@ std::optional<std::string> Installation::LayOut(const std::string& file, Install
   const auto failure = [](const std::string& path, int number) {
     return path + ": " + strerrordesc_np(number);
   };
-  if (mkdtemp(directory.data()) == nullptr) return failure(directory, errno);
+  if (mkdtemp(directory.data()) == nullptr) {
+    return failure(fs::path(directory).parent_path().string(), errno);
+  }
   directory_ = fs::canonical(directory, error).string();
   // Whatever the file is called: a library's directory has another name.
   const std::string copy = directory_ + "/base.apk";
-  if (!PutPackage(file, source.get(), copy, deadline)) return failure(copy, errno);
+  if (!PutPackage(file, source.get(), copy, deadline)) {
+    return failure(std::string(kInstalledDirectory) + "base.apk", errno);
+  }
   for (const auto& [place, entry] : layout) {
     const std::string path = directory_ + "/" + place;
     fs::create_directories(fs::path(path).parent_path(), error);
     const int extracted = Extract(archive, entry, path, deadline);
     if (extracted == 0) continue;
-    if (extracted > 0) return failure(path, extracted);
+    if (extracted > 0) return failure(kInstalledDirectory + place, extracted);
     not_extracted_.push_back(entry);
     unlink(path.c_str());
   }
   if (archive.HasShrunk()) return "it became shorter meanwhile";
   path_ = copy;
+  is_done_ = true;
   return {};
+}
+
+// The name of the directory could not be known before it was made, so it stands in no name of the
+// package's.
+std::string Installation::WithStablePaths(const std::string& journal) const {
+  if (directory_.empty()) return journal;
+  const std::string quoted = EncodeText(directory_ + "/");
+  const std::string directory = quoted.substr(1, quoted.size() - 2);
+  std::string stable;
+  size_t from = 0;
+  for (size_t at; (at = journal.find(directory, from)) != std::string::npos;
+       from = at + directory.size()) {
+    stable.append(journal, from, at - from).append(kInstalledDirectory);
+  }
+  return stable.append(journal, from, std::string::npos);
 }
 
 namespace {
@@ -98,24 +126,47 @@ std::vector<std::string> LibraryNames(const Archive& archive) {
   return names;
 }
 
+// Neither a directory of the installer's nor a place where the tool looks for a library is there.
+// A file on a read-only file system is left to the tool, which has an answer of its own for it.
+bool LiesAlone(const std::string& file, int source, const std::vector<std::string>& libraries) {
+  struct statvfs system = {};
+  if (fstatvfs(source, &system) != 0 || (system.f_flag & ST_RDONLY) != 0) return false;
+  const auto is_there = [](const std::string& path) {
+    struct stat state = {};
+    return lstat(path.c_str(), &state) == 0 || (errno != ENOENT && errno != ENOTDIR);
+  };
+  const std::string directory = file.substr(0, file.rfind('/') + 1);
+  for (const ApkTools::LibraryDirectory& each : ApkTools::kLibraryDirectories) {
+    if (is_there(directory + each.installed)) return false;
+  }
+  return std::none_of(libraries.begin(), libraries.end(), [&](const std::string& entry) {
+    const std::string place = ApkTools::InstalledLibraryPath(file, entry);
+    return !place.empty() && is_there(place);
+  });
+}
+
 // One library of a name for each kind of processor: of two ABIs for the same one, an installer
 // takes the first that the package has. Other processors' libraries are not for this phone and left
 // alone.
 Layout PlanLayout(const std::vector<std::string>& entries, InstalledAbi choice,
-                  std::vector<std::string>* left_out) {
+                  std::vector<std::string>* left_out, std::set<std::string>* of_other_processors) {
   Layout layout;
   std::set<std::string> taken;  // the directories that have libraries
   for (const char* const abi : kPhoneAbis) {
     const std::string abi_directory = kLibraryNames.prefix + std::string(abi);
     const std::string installed = ApkTools::InstalledLibraryPath("", abi_directory);
     const bool has_arm64 = taken.count(kArm64Directory) != 0;
-    if (taken.count(installed) != 0) continue;
-    if (!Wants(choice, installed == kArm64Directory, has_arm64)) continue;
+    const bool is_wanted =
+        taken.count(installed) == 0 && Wants(choice, installed == kArm64Directory, has_arm64);
     for (const std::string& entry : entries) {
       const bool is_of_abi = entry.rfind(abi_directory + "/", 0) == 0;
       if (!is_of_abi || !IsNameForInstallers(entry)) continue;
-      layout.emplace(ApkTools::InstalledLibraryPath("", entry), entry);
-      taken.insert(installed);
+      if (is_wanted) {
+        layout.emplace(ApkTools::InstalledLibraryPath("", entry), entry);
+        taken.insert(installed);
+      } else {
+        of_other_processors->insert(entry);
+      }
     }
   }
   for (const std::string& entry : entries) {

@@ -54,6 +54,7 @@ void Reader::Read(const json& event) {
   if (kind == "start") {
     record_.file = TextOf(event, "file");
     record_.path = TextOf(event, "path");
+    record_.installed = TextOf(event, "installed");
   } else if (kind == "exit") {
     if (event.contains("signal")) record_.signal = NumberOf(event, "signal");
     record_.status = NumberOf(event, "status");
@@ -166,7 +167,7 @@ void Reader::ReadVerify(const json& event) {
 // steps, where the tool asks for nothing, its path.
 bool Reader::IsOwn(const std::string& path) const {
   if (step_ == Step::kLibraries || step_ == Step::kFile) return step_ == Step::kFile;
-  return path.empty() || path == record_.path;
+  return path.empty() || path == record_.PathForTool();
 }
 
 void Reader::Begin() {

@@ -4,6 +4,7 @@
 
 #include <cstdint>
 #include <optional>
+#include <set>
 #include <string>
 #include <vector>
 
@@ -47,10 +48,17 @@ struct Failure {
   std::string detail;
 };
 
+// Which tool ran.
+struct ToolIdentity {
+  bool is_own = false;  // the one beside the simulator, which is of the simulator's version
+  std::string sha256;   // of its bytes, in lower-case hexadecimal; empty: they cannot be read
+};
+
 struct RunRecord {
   Events events;  // all that happened, in order
   std::string file;
   std::string path;
+  std::string installed;  // of a package that was laid out: <install>/base.apk; else empty
   bool is_silent = true;  // the tool neither said nor did anything
 
   std::vector<LogLine> opening_errors;  // before the first step
@@ -75,11 +83,17 @@ struct RunRecord {
 
   // What the simulator itself knows of the run.
   Failure failure;
+  ToolIdentity tool;
   bool has_standard_input = true;  // the tool was started with one
-  // The library entries that --install does not take for their names, and those that it could not
-  // extract.
+  bool has_no_packages = false;    // a directory that was walked for them; the tool was not run
+  // The library entries of a package that is laid out: of processors that were not asked for; that
+  // no installer takes, for their names; that cannot be extracted.
+  std::set<std::string> of_other_processors;
   std::vector<std::string> not_laid_out;
   std::vector<std::string> not_extracted;
+
+  // As the tool was told.
+  const std::string& PathForTool() const { return installed.empty() ? path : installed; }
 };
 
 RunRecord TakeApart(const Events& events);

@@ -43,6 +43,18 @@ std::string OwnDescriptorPath(int fd) {
   return "/proc/" + std::to_string(getpid()) + "/fd/" + std::to_string(fd);
 }
 
+// A directory for which the tool is not run: all that can be told is why.
+FileRun RunOfDirectory(const ListedFile& directory) {
+  FileRun run;
+  const std::string path = Resolved(directory.name);
+  run.journal = Event("start").Text("file", directory.name).Text("path", path).Line();
+  run.record = TakeApart(ParseEvents(run.journal));
+  run.record.has_no_packages = directory.state == ListedFile::State::kWithoutPackages;
+  run.facts.kind = FileKind::kDirectory;
+  run.facts.error = directory.error;
+  return run;
+}
+
 std::string ContentOf(int fd) {
   struct stat state = {};
   fstat(fd, &state);
@@ -69,37 +81,43 @@ std::optional<std::string> Simulator::Prepare() {
   kernel_descriptor_.emplace(open(kernel_.c_str(), O_RDONLY | O_CLOEXEC));
   if (kernel_descriptor_->get() < 0) return "there is no stand-in " + kernel_ + ErrnoText();
   if (access(options_.tool.c_str(), X_OK) != 0) return "cannot run " + options_.tool + ErrnoText();
+  tool_sha256_ = FileSha256(options_.tool);
   if (!signed_.Load()) return "cannot use the directory " + options_.state;
   return {};
 }
 
-FileRun Simulator::Run(const std::string& file) {
+FileRun Simulator::Run(const ListedFile& listed) {
+  if (listed.state != ListedFile::State::kToRun) return RunOfDirectory(listed);
+  const std::string& file = listed.name;
   Task task = {Deadline(options_.timeout), ScopedFd(memfd_create("journal", MFD_CLOEXEC)), "", {}};
   if (task.journal.get() >= 0) fcntl(task.journal.get(), F_SETFL, O_APPEND);
   Installation installation;
-  std::string installed = file;
-  if (options_.abi) {
-    const auto problem = installation.LayOut(file, *options_.abi, task.deadline);
-    if (problem) Fail(Failure::Kind::kNotInstalled, *problem, &task);
-    installed = installation.path();
-  }
+  const auto problem = installation.LayOut(file, options_.install, options_.abi, task.deadline);
+  if (problem) Fail(Failure::Kind::kNotInstalled, *problem, &task);
+  const std::string& installed = installation.path();
   struct stat before = {};
   const bool is_there = stat(installed.c_str(), &before) == 0 && S_ISREG(before.st_mode);
   task.path = Resolved(installed);
-  Event("start").Text("file", file).Text("path", task.path).AppendTo(task.journal.get());
+  Event start("start");
+  start.Text("file", file).Text("path", Resolved(file));
+  if (installation.is_done()) start.Text("installed", task.path);
+  start.AppendTo(task.journal.get());
   if (task.failure.kind == Failure::Kind::kNone) RunToolFor(installed, &task);
 
   FileRun run;
-  run.journal = ContentOf(task.journal.get());
+  const std::string journal = ContentOf(task.journal.get());
+  RememberSigned(ParseEvents(journal), &task);
+  run.journal = installation.WithStablePaths(journal);
   run.record = TakeApart(ParseEvents(run.journal));
-  RememberSigned(run.record.events, &task);
   run.record.failure = task.failure;
+  run.record.tool = {options_.is_own_tool, tool_sha256_};
   run.record.has_standard_input = has_standard_input_;
+  run.record.of_other_processors = installation.of_other_processors();
   run.record.not_laid_out = installation.left_out();
   run.record.not_extracted = installation.not_extracted();
   // What cannot be judged is not looked at.
   if (task.failure.kind != Failure::Kind::kNone) return run;
-  run.facts = LookAt(installed);
+  run.facts = LookAt(installed, [&task] { return task.deadline.HasPassed(); });
   struct stat after = {};
   const bool is_same = stat(installed.c_str(), &after) == 0 && IsSameFile(before, after);
   run.facts.was_changed = run.facts.was_changed || (is_there && !is_same);

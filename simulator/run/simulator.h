@@ -8,6 +8,7 @@
 
 #include "simulator/package/facts.h"
 #include "simulator/phone/settings.h"
+#include "simulator/run/file_list.h"
 #include "simulator/run/installation.h"
 #include "simulator/run/run_record.h"
 #include "simulator/run/signed_bytes.h"
@@ -17,14 +18,16 @@ namespace simulator {
 
 // What the phone is like, and how the tool is run in it.
 struct RunOptions {
-  PhoneSettings phone;              // all but its journal and its trusted files
-  std::vector<std::string> trust;   // existing files that the kernel trusts
-  std::string state;                // the directory that remembers what was signed; may be empty
-  std::optional<InstalledAbi> abi;  // whose libraries are laid out; none: the file stays as it lies
-  unsigned jobs = 1;                // how many files at a time
-  std::string tool;                 // the program that is run
-  std::vector<std::string> runner;  // words before the tool, such as an emulator's
-  double timeout = 30;              // seconds, for each file
+  PhoneSettings phone;             // all but its journal and its trusted files
+  std::vector<std::string> trust;  // existing files that the kernel trusts
+  std::string state;               // the directory that remembers what was signed; may be empty
+  InstallWhen install = InstallWhen::kAlone;
+  InstalledAbi abi = InstalledAbi::kPreferred;  // whose libraries are laid out
+  unsigned jobs = 1;                            // how many files at a time
+  std::string tool;                             // the program that is run
+  bool is_own_tool = false;                     // it is the one beside this program
+  std::vector<std::string> runner;              // words before the tool, such as an emulator's
+  double timeout = 30;                          // seconds, for each file
 };
 
 // What one run gave to judge by.
@@ -42,9 +45,9 @@ class Simulator {
   // else why it cannot.
   std::optional<std::string> Prepare();
 
-  // Runs the tool for `file`. May be called from several threads when the options have several
-  // jobs.
-  FileRun Run(const std::string& file);
+  // Runs the tool for `file`, unless that is a directory with nothing to run it for. May be called
+  // from several threads when the options have several jobs.
+  FileRun Run(const ListedFile& file);
 
  private:
   // One run on its way: what it needs, and why it failed.
@@ -61,6 +64,7 @@ class Simulator {
   const std::string kernel_;  // the path of the kernel stand-in
   SignedBytes signed_;
   std::optional<ScopedFd> kernel_descriptor_;
+  std::string tool_sha256_;
 };
 
 }  // namespace simulator

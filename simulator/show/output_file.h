@@ -1,5 +1,5 @@
-// A file that the command line names to be written: the journal, or the page. Nothing but an
-// earlier one of the same kind is ever replaced by it.
+// A file that the command line names to be written: the journal, the page, or a report for another
+// program. Nothing but an earlier one of the same kind is ever replaced by it.
 #pragma once
 
 #include <optional>
@@ -23,6 +23,7 @@ class OutputFile {
   OutputFile(const OutputKind& kind, std::string path) : kind_(kind), path_(std::move(path)) {}
 
   bool IsWanted() const { return !path_.empty(); }
+  const char* option() const { return kind_.option; }
 
   // Why the file must not be written to: it holds something else, or is one of `inputs`. None when
   // it may.

@@ -2,10 +2,11 @@
 
 #include <algorithm>
 #include <cstdio>
+#include <regex>
 #include <utility>
 
+#include "simulator/show/page_judgements.h"
 #include "simulator/show/protection_bar.h"
-#include "simulator/show/terminal.h"
 #include "simulator/show/timeline.h"
 #include "simulator/show/words.h"
 
@@ -19,66 +20,69 @@ using kainjow::mustache::object;
 
 // The fields of the template's sections. Every text goes through Shown, and the template escapes
 // it.
-data FileFields(const Report& report, size_t number);
+data FileFields(const Report& report, size_t number, const PageRun& run);
 list HeadLines(const Report& report);
 void AddItems(const Report& report, data* file);
 void AddPicture(const Report& report, data* file);
 void AddSigners(const Report& report, data* file);
 
-// Sets the section "NAME_shown" with the section `name` in it: what `make` makes of the first
-// lines, and how many there are beyond them.
-template <typename Lines, typename Make>
-void AddLines(const char* name, const Lines& lines, const std::string& remark, Make make,
-              data* file);
-
-data Shown(std::string_view bytes);
-std::string Short(std::string_view bytes);
-Reason Short(Reason reason);
-Item Short(Item item);
-list OneIf(bool condition);
-const char* StateOf(Mark mark);
-std::string Grouped(uint64_t number);
+list Pieces(std::string_view text);
+list FactRows(const Report& report, const PageRun& run);
+std::string ToolText(const PageRun& run);
+std::string TimeText(std::time_t time, const char* format);
 std::string Decimal(double number);
 
 }  // namespace
 
 void Page::Add(const Report& report) {
   verdicts_.push_back(report.verdict);
-  files_.push_back(FileFields(report, verdicts_.size()));
+  table_.Add(report);
+  files_.push_back(FileFields(report, verdicts_.size(), run_));
 }
 
-std::string Page::Html() const {
+std::string Page::Html(std::optional<size_t> unseen) const {
   const bool has_several = files_.size() > 1;
+  const std::string missed = Counted(unseen.value_or(0), "file", "files") + " of " +
+                             std::to_string(files_.size() + unseen.value_or(0));
   data fields;
   fields.set("version", Shown(APKTOOLKIT_VERSION));
-  fields.set("summary", Shown(Summary(verdicts_)));
+  fields.set("date", Shown(TimeText(run_.begun, "%Y-%m-%dT%H:%M:%SZ")));
+  fields.set("time", Shown(TimeText(run_.begun, "%Y-%m-%d %H:%M:%S UTC")));
+  fields.set("tool", Shown(ToolText(run_)));
+  fields.set("summary", Shown(Summary(verdicts_, unseen)));
+  fields.set("interrupted", OneIf(unseen.has_value()));
+  fields.set("unseen", unseen.value_or(0) > 0 ? list{{"missed", Shown(missed)}} : list());
   fields.set("several", data(OneIf(has_several)));
   fields.set("alone", data(OneIf(!has_several)));
   fields.set("files", data(files_));
+  table_.Fill(&fields);
   return std::string(kPageStart) + kainjow::mustache::mustache(kPageTemplate).render(fields);
 }
 
 namespace {
 
-data FileFields(const Report& report, size_t number) {
-  constexpr const char* kMoods[] = {"good", "mixed", "bad"};
+data FileFields(const Report& report, size_t number, const PageRun& run) {
   const VerdictWords& words = WordsOf(report.verdict);
   data file = object{{"number", Shown(std::to_string(number))},
                      {"file", Shown(Short(report.file))},
                      {"verdict", Shown(words.word)},
-                     {"mood", Shown(kMoods[static_cast<size_t>(words.mood)])},
-                     {"about", HeadLines(report)}};
+                     {"code", Shown(words.code)},
+                     {"mood", Shown(MoodCode(words.mood))},
+                     {"is_warned", OneIf(!report.warnings.empty())},
+                     {"about", HeadLines(report)},
+                     {"facts", FactRows(report, run)}};
   AddItems(report, &file);
   const auto warn = [](const Reason& warning) {
     return object{{"warning", Shown(Short(warning).Text())},
-                  {"remedy", Shown(warning.cause->cure)}};
+                  {"remedy", Pieces(warning.cause->cure)}};
   };
   AddLines("warnings", report.warnings, "", warn, &file);
+  AddJudgements(report, &file);
   AddPicture(report, &file);
   const auto chain = [](const Link& link) {
     const Mark mark = MarkOf(link.state);
     return object{{"mark", Shown(SymbolOf(mark, true))},
-                  {"state", Shown(StateOf(mark))},
+                  {"state", Shown(MarkCode(mark))},
                   {"link", Shown(link.name)},
                   {"at", Shown(Short(TextOf(link)))},
                   {"is_broken", data(link.state == LinkState::kBroken)}};
@@ -92,8 +96,8 @@ data FileFields(const Report& report, size_t number) {
                   {"details", has_detail ? list{{"detail", Shown(Short(line.detail))}} : list()},
                   {"is_failure", data(line.is_failure)}};
   };
-  AddLines("events", MakeTimeline(report.events, report.path), "the journal has them all", tell,
-           &file);
+  AddLines("events", MakeTimeline(report.events, PathForTool(report)), "the journal has them all",
+           tell, &file);
   return file;
 }
 
@@ -107,7 +111,9 @@ list HeadLines(const Report& report) {
   head.key = report.key;
   for (const Reason& warning : report.warnings) head.warnings.push_back(Short(warning));
   list lines;
-  for (const std::string& fact : HeadFacts(head, "…")) lines.push_back({"fact", Shown(fact)});
+  for (const std::string& fact : OwnerFacts(head, "…")) lines.push_back({"fact", Shown(fact)});
+  for (const std::string& fact : AlarmFacts(head)) lines.push_back({"fact", Shown(fact)});
+  if (!report.installed.empty()) lines.push_back({"fact", Shown(kLaidOutText)});
   return lines;
 }
 
@@ -123,10 +129,10 @@ void AddItems(const Report& report, data* file) {
     const Item shown = Short(item);
     const bool has_cure = HasCure(item, &item + 1 == end ? nullptr : &item + 1);
     return object{{"mark", Shown(SymbolOf(mark, true))},
-                  {"state", Shown(StateOf(mark))},
+                  {"state", Shown(MarkCode(mark))},
                   {"name", Shown(NameOf(shown))},
                   {"outcome", Shown(OutcomeOf(shown, report.verdict))},
-                  {"cures", has_cure ? list{{"cure", Shown(item.reason.cause->cure)}} : list()}};
+                  {"cures", has_cure ? list{{"cure", Pieces(item.reason.cause->cure)}} : list()}};
   };
   const auto refused = static_cast<uint64_t>(std::count_if(items.begin(), items.end(), is_refused));
   AddLines("items", items, Counted(refused, "is refused", "are refused") + " of all", make, file);
@@ -153,6 +159,8 @@ void AddPicture(const Report& report, data* file) {
   file->set("description", Shown(description));
   file->set("parts", parts);
   const auto name = [](const std::string& entry) { return object{{"entry", Shown(Short(entry))}}; };
+  AddLines("differing", report.protection.differing_names, "", name, file);
+  AddLines("missing", report.protection.missing_names, "", name, file);
   AddLines("unlisted", report.protection.unlisted_names, "", name, file);
 }
 
@@ -187,61 +195,51 @@ void AddSigners(const Report& report, data* file) {
   AddLines("signers", signers, "", make, file);
 }
 
-template <typename Lines, typename Make>
-void AddLines(const char* name, const Lines& lines, const std::string& remark, Make make,
-              data* file) {
-  list made;
-  while (made.size() < std::min(lines.size(), kMostPageLines)) {
-    made.push_back(data(make(lines[made.size()])));
-  }
-  const size_t hidden = lines.size() - made.size();
-  const std::string text = Grouped(hidden) + " more" + (remark.empty() ? "" : "; " + remark);
-  file->set(std::string(name) + "_shown", OneIf(!made.empty()));
-  file->set(name, made);
-  file->set(std::string(name) + "_count", Shown(Grouped(lines.size())));
-  file->set(std::string(name) + "_more", hidden > 0 ? list{{"more", Shown(text)}} : list());
-}
-
-// Nothing is shown that would deceive the eye; characters that HTML gives a meaning are escaped
-// where the template is filled in.
-data Shown(std::string_view bytes) { return Printable(bytes, {false, true}); }
-
-// The beginning of what is too long, without a part of a character at its end.
-std::string Short(std::string_view bytes) {
-  constexpr size_t kLongestCharacter = 4;
-  if (bytes.size() <= kMostPageText) return std::string(bytes);
-  size_t size = kMostPageText;
-  const auto is_inside = [bytes](size_t at) {
-    return (static_cast<unsigned char>(bytes[at]) & 0xc0U) == 0x80;
+// A text that is the simulator's own, with the names of options apart, which no line end may part.
+list Pieces(std::string_view text) {
+  static const std::regex kOption("--[a-z][a-z-]*(=[A-Za-z]+)?");
+  list pieces;
+  const auto add = [&pieces](const char* name, const std::string& piece) {
+    if (!piece.empty()) pieces.push_back(object{{name, list{{"words", Shown(piece)}}}});
   };
-  while (size + kLongestCharacter > kMostPageText + 1 && is_inside(size)) --size;
-  return std::string(bytes.substr(0, size)) + "…";
+  std::string rest(text);
+  for (std::smatch match; std::regex_search(rest, match, kOption); rest = match.suffix()) {
+    add("plain", match.prefix());
+    add("option", match.str());
+  }
+  add("plain", rest);
+  return pieces;
 }
 
-Reason Short(Reason reason) {
-  reason.detail = Short(reason.detail);
-  return reason;
+// What file this is, and of what run: all that a reader needs who gets this part alone.
+list FactRows(const Report& report, const PageRun& run) {
+  Rows rows = {{"path", report.path}};
+  if (!report.file_sha256.empty()) {
+    rows.emplace_back("size (bytes)", Grouped(report.file_size));
+    rows.emplace_back("SHA-256 digest", report.file_sha256);
+  }
+  rows.emplace_back("looked at in the run of", TimeText(run.begun, "%Y-%m-%d %H:%M:%S UTC"));
+  rows.emplace_back("tool", ToolText(run));
+  rows.emplace_back("simulator", "apktoolkit-sim " APKTOOLKIT_VERSION);
+  list shown;
+  for (const auto& [label, value] : rows) {
+    if (!value.empty())
+      shown.push_back(object{{"term", Shown(label)}, {"value", Shown(Short(value))}});
+  }
+  return shown;
 }
 
-Item Short(Item item) {
-  item.name = Short(item.name);
-  item.reason = Short(std::move(item.reason));
-  return item;
+// The tool tells nobody its version. It is the simulator's where both are of one build.
+std::string ToolText(const PageRun& run) {
+  if (run.tool.empty()) return "apktoolkit " APKTOOLKIT_VERSION;
+  return Short(run.tool) + " (--tool; its version is not known)";
 }
 
-// A section of the template that is shown or not, without fields of its own.
-list OneIf(bool condition) { return condition ? list{data()} : list(); }
-
-const char* StateOf(Mark mark) {
-  constexpr const char* kCodes[] = {"good", "bad", "neither"};
-  return kCodes[static_cast<size_t>(mark)];
-}
-
-// Such as "1,234,567".
-std::string Grouped(uint64_t number) {
-  std::string text = std::to_string(number);
-  for (size_t at = text.size(); at > 3; at -= 3) text.insert(at - 3, ",");
-  return text;
+std::string TimeText(std::time_t time, const char* format) {
+  std::tm parts = {};
+  char text[64];
+  if (gmtime_r(&time, &parts) == nullptr) return "unknown";
+  return {text, strftime(text, sizeof(text), format, &parts)};
 }
 
 std::string Decimal(double number) {

@@ -4,11 +4,16 @@
 // there is only so much of it, be the file as large as it may.
 #pragma once
 
+#include <ctime>
 #include <kainjow/mustache.hpp>
+#include <optional>
 #include <string>
 #include <string_view>
+#include <utility>
 #include <vector>
 
+#include "simulator/show/page_fields.h"
+#include "simulator/show/page_table.h"
 #include "simulator/verdict/report.h"
 
 namespace simulator {
@@ -17,25 +22,29 @@ namespace simulator {
 inline constexpr std::string_view kPageStart =
     "<!DOCTYPE html>\n<!-- A page of apktoolkit-sim -->\n";
 
-// Of each file at most so many lines of a kind are shown. The rest are counted. If items are left
-// out, the refused ones go first.
-inline constexpr size_t kMostPageLines = 200;
-// Of a text that came from a file at most so many bytes are shown, with "…" for the rest, before
-// they are escaped.
-inline constexpr size_t kMostPageText = 400;
-
 // The page's template (page.mustache), which the build makes a part of the program.
 extern const char kPageTemplate[];
 
+// What is told of the whole run.
+struct PageRun {
+  std::time_t begun = 0;  // when it began
+  std::string tool;       // the program that --tool names; empty: the tool of this version
+};
+
 class Page {
  public:
+  explicit Page(PageRun run) : run_(std::move(run)) {}
+
   // The next file, in the order of the command line.
   void Add(const Report& report);
 
-  // The whole document, in UTF-8.
-  std::string Html() const;
+  // The whole document, in UTF-8. `unseen` is set if the run was interrupted, and counts the files
+  // that it did not come to.
+  std::string Html(std::optional<size_t> unseen = {}) const;
 
  private:
+  PageRun run_;
+  PageTable table_;
   kainjow::mustache::list files_;  // what the template shows of each
   std::vector<Verdict> verdicts_;
 };

@@ -3,11 +3,13 @@
 #include <unistd.h>
 
 #include <algorithm>
+#include <ctime>
 #include <iostream>
 
 #include "simulator/phone/journal.h"
 #include "simulator/show/verdict_event.h"
 #include "simulator/show/words.h"
+#include "simulator/verdict/make_report.h"
 
 namespace simulator {
 
@@ -15,6 +17,8 @@ namespace {
 
 constexpr OutputKind kJournal = {"--journal", "journal", "{\"event\":\"journal\""};
 constexpr OutputKind kPage = {"--html", "page", kPageStart};
+constexpr OutputKind kJunit = {"--junit", "JUnit report", kJunitStart};
+constexpr OutputKind kSarif = {"--sarif", "SARIF log", kSarifStart};
 constexpr char kEraseLine[] = "\r\x1b[K";
 
 }  // namespace
@@ -25,12 +29,21 @@ Presenter::Presenter(const ShowOptions& options, size_t file_count)
       has_progress_(isatty(STDERR_FILENO) != 0),
       look_(LookOfStandardOutput()),
       journal_(kJournal, options.journal),
-      page_file_(kPage, options.html) {}
+      page_file_(kPage, options.html),
+      page_({std::time(nullptr), options.tool}),
+      junit_file_(kJunit, options.junit),
+      sarif_file_(kSarif, options.sarif) {}
 
 std::optional<std::string> Presenter::Objection(const std::vector<std::string>& inputs) const {
-  if (journal_.IsSameAs(page_file_)) return "--journal and --html name the same file";
-  if (auto objection = journal_.Objection(inputs)) return objection;
-  return page_file_.Objection(inputs);
+  const OutputFile* const files[] = {&journal_, &page_file_, &junit_file_, &sarif_file_};
+  for (const OutputFile* const* file = std::begin(files); file != std::end(files); ++file) {
+    for (const OutputFile* const* other = file + 1; other != std::end(files); ++other) {
+      if (!(*file)->IsSameAs(**other)) continue;
+      return std::string((*file)->option()) + " and " + (*other)->option() + " name the same file";
+    }
+    if (auto objection = (*file)->Objection(inputs)) return objection;
+  }
+  return {};
 }
 
 bool Presenter::Begin() {
@@ -39,7 +52,9 @@ bool Presenter::Begin() {
   } else {
     Keep(Event("journal").Number("version", kJournalVersion).Line());
   }
-  if (!page_file_.Open()) FailToWrite(page_file_);
+  for (OutputFile* const file : {&page_file_, &junit_file_, &sarif_file_}) {
+    if (!file->Open()) FailToWrite(*file);
+  }
   return status_ == kAllSigned;
 }
 
@@ -53,10 +68,14 @@ void Presenter::Show(const Report& report, const std::string& journal) {
     PrintReport(report, options_.detail, look_, std::cout);
   }
   if (page_file_.IsWanted()) page_.Add(report);
+  if (junit_file_.IsWanted()) junit_.Add(report);
+  if (sarif_file_.IsWanted()) sarif_.Add(report);
   std::cout.flush();
   verdicts_.push_back(report.verdict);
+  if (report.installer.state == Judgement::State::kMissing) missing_ = report.installer.why;
   if (report.verdict == Verdict::kNotSimulated) {
-    Complain(kCannotSimulate, report.file + ": " + report.items[0].reason.Text());
+    if (DecisiveItem(report)->reason.cause == &cause::kInterrupted) is_interrupted_ = true;
+    Complain(kCannotSimulate, report.file + ": " + DecisiveItem(report)->reason.Text());
   }
   status_ = std::max<int>(status_, StatusOf(report.verdict));
 }
@@ -91,14 +110,50 @@ void Presenter::EraseProgress() {
   is_progress_shown_ = false;
 }
 
-int Presenter::Finish() {
+int Presenter::Finish(const std::vector<std::string>& files) {
   EraseProgress();
   if (!options_.json && options_.detail != Detail::kVerdict && file_count_ > 1 &&
       !verdicts_.empty()) {
-    std::cout << '\n' << Summary(verdicts_) << '\n';
+    std::cout << '\n' << Summary(verdicts_, Unseen()) << '\n';
   }
-  if (page_file_.IsWanted() && !page_file_.Append(page_.Html())) FailToWrite(page_file_);
+  if (page_file_.IsWanted() && !page_file_.Append(page_.Html(Unseen()))) FailToWrite(page_file_);
+  ReportUntold({files.begin() + static_cast<std::ptrdiff_t>(shown_), files.end()},
+               {&cause::kInterrupted, ""});
+  WriteReports();
+  if (!missing_.empty()) Complain(status_, "no phone's installer was asked: " + missing_);
   return EndWith(status_);
+}
+
+// If the run was interrupted: how many files it did not come to.
+std::optional<size_t> Presenter::Unseen() const {
+  const size_t unseen = file_count_ - shown_;
+  if (unseen == 0 && !is_interrupted_) return std::nullopt;
+  return unseen;
+}
+
+int Presenter::GiveUp(const std::vector<std::string>& files, const std::string& problem) {
+  status_ = Complain(kCannotSimulate, problem);
+  for (OutputFile* const file : {&junit_file_, &sarif_file_}) {
+    if (!file->Open()) FailToWrite(*file);
+  }
+  ReportUntold(files, {&cause::kNotBegun, problem});
+  WriteReports();
+  return status_;
+}
+
+void Presenter::ReportUntold(const std::vector<std::string>& files, const Reason& why) {
+  for (const std::string& file : files) {
+    Report report;
+    report.file = file;
+    report.items = {NotDone(ItemKind::kTool, "tool", why, {})};
+    junit_.Add(report);
+    sarif_.Add(report);
+  }
+}
+
+void Presenter::WriteReports() {
+  if (junit_file_.IsWanted() && !junit_file_.Append(junit_.Xml())) FailToWrite(junit_file_);
+  if (sarif_file_.IsWanted() && !sarif_file_.Append(sarif_.Log())) FailToWrite(sarif_file_);
 }
 
 // The journal goes to its file, and to standard output when that is asked for.

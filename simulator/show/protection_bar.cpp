@@ -1,6 +1,7 @@
 #include "simulator/show/protection_bar.h"
 
 #include <algorithm>
+#include <string_view>
 
 #include "simulator/show/words.h"
 
@@ -11,8 +12,8 @@ namespace {
 // Entries may overlap and claim more bytes than the file has; then nothing lies between them.
 Share Between(const Protection& protection, uint64_t file_size) {
   uint64_t rest = file_size;
-  for (const Share* share :
-       {&protection.verified, &protection.vouched, &protection.unlisted, &protection.signature}) {
+  for (const Share* share : {&protection.verified, &protection.vouched, &protection.differing,
+                             &protection.uncompared, &protection.unlisted, &protection.signature}) {
     rest -= std::min(rest, share->bytes);
   }
   return {0, rest};
@@ -25,14 +26,35 @@ std::vector<DrawnPart> DrawBar(const Protection& protection, uint64_t file_size)
   std::vector<DrawnPart> parts = {
       {"verified", kVerifiedWord, "dex and native libraries, compared with the manifest", true,
        protection.verified, 0, 0, 0},
-      {"vouched", kVouchedWord, "the manifest has a digest, which nothing was found to match", true,
+      {"vouched", kVouchedWord, "as the manifest lists them, and the tool does not look", true,
        protection.vouched, 0, 0, 0},
+      {"differing", kDifferingWord, "changed after signing: the manifest has another digest", true,
+       protection.differing, 0, 0, 0},
+      {"uncompared", kUncomparedWord, "damaged, too long, or the time was up", true,
+       protection.uncompared, 0, 0, 0},
+      {"missing",
+       kMissingWord,
+       "removed after signing: the manifest still lists them",
+       true,
+       {protection.missing_names.size(), 0},
+       0,
+       0,
+       0},
       {"unlisted", kUnlistedWord, "no digest in the manifest: anyone may have changed them", true,
        protection.unlisted, 0, 0, 0},
       {"signature", "the signature itself", "manifest, signature files and their blocks", true,
        protection.signature, 0, 0, 0},
       {"between", "between the entries", "headers, directory, padding, newer signing block", false,
        Between(protection, file_size), 0, 0, 0}};
+  // Faults that a package has not got take no line.
+  parts.erase(
+      std::remove_if(parts.begin(), parts.end(),
+                     [](const DrawnPart& part) {
+                       const std::string_view code = part.code;
+                       return part.share.entries == 0 &&
+                              (code == "differing" || code == "uncompared" || code == "missing");
+                     }),
+      parts.end());
   double all = 0;
   size_t entries = 0;
   double free_width = 100;

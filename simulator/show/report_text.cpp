@@ -50,6 +50,7 @@ void PrintReport(const Report& report, Detail detail, const Look& look, std::ost
   printer.PrintHead();
   if (detail == Detail::kVerdict) return;
   printer.PrintItems();
+  if (!report.installed.empty()) out << "  " << kLaidOutText << '\n';
   printer.PrintWarnings();
   if (detail == Detail::kAll) printer.PrintUnlisted();
   printer.PrintSigner();
@@ -57,7 +58,7 @@ void PrintReport(const Report& report, Detail detail, const Look& look, std::ost
     printer.PrintNewerSigners();
     printer.PrintChain();
   }
-  PrintTimeline(MakeTimeline(report.events, report.path), look, out);
+  PrintTimeline(MakeTimeline(report.events, PathForTool(report)), look, out);
 }
 
 namespace {
@@ -98,8 +99,11 @@ void Printer::PrintWarnings() {
 }
 
 void Printer::PrintUnlisted() {
-  for (const std::string& name : report_.protection.unlisted_names) {
-    Print(std::string("      ") + kUnlistedWord + ": " + name);
+  const Protection& all = report_.protection;
+  for (const auto& [names, word] : {std::make_pair(&all.differing_names, kDifferingWord),
+                                    std::make_pair(&all.missing_names, kMissingWord),
+                                    std::make_pair(&all.unlisted_names, kUnlistedWord)}) {
+    for (const std::string& name : *names) Print(std::string("      ") + word + ": " + name);
   }
 }
 
@@ -108,9 +112,17 @@ void Printer::PrintSigner() {
   Print("  signer");
   PrintRows(SignerRows(report_));
   Print("    schemes: " + Joined(report_.schemes));
+  const std::string takers = TakersText(report_.installer);
+  if (!takers.empty()) Print("    installer: " + takers);
   const Protection& all = report_.protection;
-  Print("    protects: " + ShareText(all.verified, kVerifiedWord) + ", " +
-        ShareText(all.vouched, kVouchedWord) + ", " + ShareText(all.unlisted, kUnlistedWord));
+  std::string text = ShareText(all.verified, kVerifiedWord) + ", " +
+                     ShareText(all.vouched, kVouchedWord) + ", " +
+                     ShareText(all.unlisted, kUnlistedWord);
+  if (all.differing.entries > 0) text += ", " + ShareText(all.differing, kDifferingWord);
+  if (all.uncompared.entries > 0) text += ", " + ShareText(all.uncompared, kUncomparedWord);
+  const uint64_t missing = all.missing_names.size();
+  if (missing > 0) text += ", " + Counted(missing, "entry ", "entries ") + kMissingWord;
+  Print("    protects: " + text);
 }
 
 void Printer::PrintNewerSigners() {

@@ -9,21 +9,28 @@ namespace {
 // In the order of the verdicts.
 constexpr VerdictWords kVerdicts[] = {
     {"signed", "SIGNED", "signed", "signed", Mood::kGood},
+    {"other-signer", "SIGNED, OTHER SIGNER", "signed for another signer",
+     "signed for another signer", Mood::kMixed},
     {"trusted-jar", "TRUSTED JAR", "trusted JAR", "trusted JARs", Mood::kGood},
     {"partly-signed", "PARTLY SIGNED", "partly signed", "partly signed", Mood::kMixed},
+    {"not-installable", "NOT INSTALLABLE", "not installable", "not installable", Mood::kBad},
+    {"not-accepted", "NOT ACCEPTED", "not accepted", "not accepted", Mood::kBad},
     {"refused", "REFUSED", "refused", "refused", Mood::kBad},
     {"not-trusted-jar", "NOT TRUSTED JAR", "JAR not trusted", "JARs not trusted", Mood::kBad},
     {"not-looked-at", "NOT LOOKED AT", "not looked at", "not looked at", Mood::kBad},
     {"not-simulated", "NOT SIMULATED", "not simulated", "not simulated", Mood::kBad},
 };
 
-std::string SignerText(const Report& report, const char* ellipsis);
-
 }  // namespace
 
 const VerdictWords& WordsOf(Verdict verdict) { return kVerdicts[static_cast<size_t>(verdict)]; }
 
-std::string Summary(const std::vector<Verdict>& verdicts) {
+const char* MoodCode(Mood mood) {
+  constexpr const char* kCodes[] = {"good", "mixed", "bad"};
+  return kCodes[static_cast<size_t>(mood)];
+}
+
+std::string Summary(const std::vector<Verdict>& verdicts, std::optional<size_t> unseen) {
   std::string text = Counted(verdicts.size(), "file", "files");
   const char* separator = ": ";
   for (const VerdictWords& words : kVerdicts) {
@@ -33,13 +40,58 @@ std::string Summary(const std::vector<Verdict>& verdicts) {
     text += separator + Counted(static_cast<uint64_t>(count), words.one, words.many);
     separator = ", ";
   }
+  if (unseen) text += "; interrupted";
+  if (unseen.value_or(0) > 0) text += " before " + Counted(*unseen, "more file", "more files");
   return text;
 }
 
 std::vector<std::string> HeadFacts(const Report& report, const char* ellipsis) {
+  const std::string reason = DecisiveReason(report);
+  std::vector<std::string> facts = {reason};
+  if (reason.empty()) facts = OwnerFacts(report, ellipsis);
+  for (const Item& item : report.items) {
+    const bool is_told = &item == DecisiveItem(report);
+    const bool counts = item.kind == ItemKind::kSigner && item.state == ItemState::kRefused &&
+                        item.reason.cause->severity == Severity::kRefused;
+    if (counts && !is_told) facts.push_back(item.reason.Text());
+  }
+  for (const std::string& alarm : AlarmFacts(report)) facts.push_back(alarm);
+  const size_t warnings = report.warnings.size();
+  if (warnings > 0) facts.push_back(Counted(warnings, "warning", "warnings"));
+  return facts;
+}
+
+std::string DecisiveReason(const Report& report) {
+  const Item* const item = DecisiveItem(report);
+  if (item == nullptr) return {};
+  return (item->kind == ItemKind::kLibrary ? item->name + ": " : "") + item->reason.Text();
+}
+
+std::vector<std::string> OwnerFacts(const Report& report, const char* ellipsis) {
   std::vector<std::string> facts;
   if (!report.package_name.empty()) facts.push_back(report.package_name);
   if (report.signer || report.key) facts.push_back("signer " + SignerText(report, ellipsis));
+  if (std::string other = OtherOwnerText(report); !other.empty()) facts.push_back(other);
+  return facts;
+}
+
+std::string SignerText(const Report& report, const char* ellipsis) {
+  std::string text = report.signer ? report.signer->subject : "unknown";
+  if (const std::string key = KeyName(report); !key.empty()) text += ", " + key;
+  if (!report.key) return text;
+  const std::string& digest = report.key->sha256;
+  if (digest.size() < 16) return text + ", key " + digest;
+  return text + ", key " + digest.substr(0, 8) + ellipsis + digest.substr(digest.size() - 6);
+}
+
+std::string OtherOwnerText(const Report& report) {
+  if (report.verdict != Verdict::kOtherSigner) return {};
+  const CertificateFacts* const other = OtherSigner(report.installer, report);
+  return other == nullptr ? "" : "phones install it for " + other->subject;
+}
+
+std::vector<std::string> AlarmFacts(const Report& report) {
+  std::vector<std::string> facts;
   for (const Reason& warning : report.warnings) {
     if (warning.cause->severity == Severity::kAlarm) facts.push_back("! " + warning.Text());
   }
@@ -54,6 +106,11 @@ Mark MarkOf(ItemState state) {
 Mark MarkOf(LinkState state) {
   if (state == LinkState::kHolds) return Mark::kGood;
   return state == LinkState::kBroken ? Mark::kBad : Mark::kNeither;
+}
+
+const char* MarkCode(Mark mark) {
+  constexpr const char* kCodes[] = {"good", "bad", "neither"};
+  return kCodes[static_cast<size_t>(mark)];
 }
 
 const char* SymbolOf(Mark mark, bool has_utf8) {
@@ -72,7 +129,11 @@ std::string OutcomeOf(const Item& item, Verdict verdict) {
     return "signed";
   }
   if (item.state != ItemState::kRefused) return "nothing to sign: " + reason;
-  if (item.kind == ItemKind::kTool || item.kind == ItemKind::kEntries) return reason;
+  if (item.kind == ItemKind::kTool || item.kind == ItemKind::kEntries ||
+      item.kind == ItemKind::kInstaller || item.kind == ItemKind::kSigner ||
+      item.kind == ItemKind::kWarnings) {
+    return reason;
+  }
   if (item.kind == ItemKind::kKey) return "not registered: " + reason;
   return (verdict == Verdict::kNotLookedAt ? "not looked at: " : "not signed: ") + reason;
 }
@@ -111,19 +172,5 @@ Rows SignerRows(const Report& report) {
   rows.emplace_back("modulus SHA-256 digest", report.key->sha256 + " (of the modulus alone" + use);
   return rows;
 }
-
-namespace {
-
-// Such as "CN=Vault, RSA-2048, key 98302ce8…f64646".
-std::string SignerText(const Report& report, const char* ellipsis) {
-  std::string text = report.signer ? report.signer->subject : "unknown";
-  if (const std::string key = KeyName(report); !key.empty()) text += ", " + key;
-  if (!report.key) return text;
-  const std::string& digest = report.key->sha256;
-  if (digest.size() < 16) return text + ", key " + digest;
-  return text + ", key " + digest.substr(0, 8) + ellipsis + digest.substr(digest.size() - 6);
-}
-
-}  // namespace
 
 }  // namespace simulator

@@ -16,7 +16,9 @@ enum class Group {
   kLibrary,
   kKey,
   kTool,
-  kWarning,  // all may be signed, and yet
+  kInstaller,  // a phone's installer would not take the package
+  kGate,       // the command line demands something else
+  kWarning,    // all may be signed, and yet
 };
 
 // What a cause means for the thing that it is said of.
@@ -70,6 +72,10 @@ inline constexpr Cause kStandardInputClosed = {"standard-input-closed", Group::k
 inline constexpr Cause kFileLeased = {"file-leased", Group::kNotLookedAt, Severity::kUnseen,
     ChainLink::kKey, "", "another process holds a lease on it",
     "Have that process close the file, and run again; /proc/locks names it by its number."};
+inline constexpr Cause kNoPackages = {"no-packages", Group::kNotLookedAt, Severity::kUnseen,
+    ChainLink::kKey, "", "it is a directory, and no file in it or below it has a package's name",
+    "--recursive takes .apk, .jar, .apks, .xapk, .apkm and .aab. Name other files one by one, or "
+    "with --files-from."};
 
 // ---- The simulation could not tell.
 inline constexpr Cause kToolNotStarted = {"tool-not-started", Group::kSimulation, Severity::kFailed,
@@ -90,12 +96,19 @@ inline constexpr Cause kStateNotKept = {"state-not-kept", Group::kSimulation, Se
 inline constexpr Cause kNotInstalled = {"not-installed", Group::kSimulation, Severity::kFailed,
     ChainLink::kKey, "", "its libraries cannot be laid out: %s",
     "Make room in the folder for temporary files (TMPDIR)."};
+inline constexpr Cause kNotBegun = {"not-begun", Group::kSimulation, Severity::kFailed,
+    ChainLink::kKey, "", "no file could be simulated: %s",
+    "Fix the reported error, and run again."};
 inline constexpr Cause kInterrupted = {"interrupted", Group::kSimulation, Severity::kFailed,
     ChainLink::kKey, "", "it was interrupted", "Run it again."};
 
 // ---- What the file is.
 inline constexpr Cause kFolder = {"folder", Group::kFile, Severity::kRefused, ChainLink::kKey,
-    "`OpenArchiveFd(`", "it is a folder", "Name the package inside it, such as base.apk."};
+    "`OpenArchiveFd(`", "it is a directory",
+    "Name the package inside it, or give --recursive."};
+inline constexpr Cause kPackageDirectory = {"package-directory", Group::kFile, Severity::kRefused,
+    ChainLink::kKey, "`OpenArchiveFd(`", "it is a directory with %s in it",
+    "Name them all, a base and its splits: DIRECTORY/*.apk; or give --recursive."};
 inline constexpr Cause kSpecialFile = {"special-file", Group::kFile, Severity::kRefused,
     ChainLink::kKey, "`OpenArchiveFd(`", "it is a device, a pipe or a socket", "Name a file."};
 inline constexpr Cause kEmptyFile = {"empty-file", Group::kFile, Severity::kRefused,
@@ -115,6 +128,23 @@ inline constexpr Cause kDamagedArchive = {"damaged-archive", Group::kFile, Sever
     ChainLink::kEntries, "`OpenArchiveFd(`",
     "it is a damaged archive, which the zip library does not open",
     "Copy or download it again. unzip -t, and the ziparchive lines of the log, name the fault."};
+inline constexpr Cause kEntryTwice = {"entry-twice", Group::kFile, Severity::kRefused,
+    ChainLink::kEntries, "`OpenArchiveFd(`",
+    "%s stands in it more than once, and the zip library does not open that",
+    "Build the package again, with one entry of each name. If it is not of your making: do not "
+    "trust it."};
+inline constexpr Cause kAppBundle = {"app-bundle", Group::kFile, Severity::kRefused,
+    ChainLink::kKey, "`VELT can't verify a file`",
+    "it is an app bundle (.aab), which no phone installs",
+    "Make packages of it with bundletool build-apks, and name those."};
+inline constexpr Cause kPackageSet = {"package-set", Group::kFile, Severity::kRefused,
+    ChainLink::kKey, "`VELT can't verify a file`",
+    "it is an archive of packages (.apks, .xapk), and no package itself",
+    "Unpack it, and name the packages in it, the base and its splits."};
+inline constexpr Cause kPackageWithoutManifest = {"package-without-manifest", Group::kFile,
+    Severity::kRefused, ChainLink::kKey, "`VELT can't verify a file`", "it has parts of a package "
+    "(%s) and no AndroidManifest.xml, so it counts as a plain JAR, which the kernel does not trust",
+    "Build the package again with aapt or aapt2, which put AndroidManifest.xml in it."};
 inline constexpr Cause kJarNotTrusted = {"jar-not-trusted", Group::kFile, Severity::kRefused,
     ChainLink::kKey, "`VELT can't verify a file`",
     "it is a plain JAR, and those are signed only when the kernel trusts them already (%s)",
@@ -159,19 +189,27 @@ inline constexpr Cause kSignatureBlockMalformed = {"signature-block-malformed", 
 inline constexpr Cause kEcKey = {"ec-key", Group::kSignature, Severity::kRefused, ChainLink::kKey,
     "`Can't extract RSA certificate`, `Unknown certificate type`",
     "its key is an EC key, and this tool knows RSA alone",
-    "Sign it with an RSA key of 2048 to 4096 bits."};
+    "Sign it with an RSA key of 2048 to 4096 bits. That is another "
+    "signer: phones refuse it as an update of a published app. Rotation does not help: the JAR "
+    "signature stays the first key's."};
 inline constexpr Cause kDsaKey = {"dsa-key", Group::kSignature, Severity::kRefused, ChainLink::kKey,
     "`Can't extract RSA certificate`, `Unknown certificate type`",
     "its key is a DSA key, and this tool knows RSA alone",
-    "Sign it with an RSA key of 2048 to 4096 bits."};
+    "Sign it with an RSA key of 2048 to 4096 bits. That is another "
+    "signer: phones refuse it as an update of a published app. Rotation does not help: the JAR "
+    "signature stays the first key's."};
 inline constexpr Cause kKeyTooLarge = {"key-too-large", Group::kSignature, Severity::kRefused,
     ChainLink::kKey, "`RSA could not verify certificate`",
     "its RSA key has %s bits, and this tool takes at most 4096",
-    "Sign it with an RSA key of 2048 to 4096 bits."};
+    "Sign it with an RSA key of 2048 to 4096 bits. That is another "
+    "signer: phones refuse it as an update of a published app. Rotation does not help: the JAR "
+    "signature stays the first key's."};
 inline constexpr Cause kKeyTooSmall = {"key-too-small", Group::kSignature, Severity::kRefused,
     ChainLink::kKey, "`RSA could not verify certificate`",
     "its RSA key has %s bits, and this tool takes no fewer than 128",
-    "Sign it with an RSA key of 2048 to 4096 bits."};
+    "Sign it with an RSA key of 2048 to 4096 bits. That is another "
+    "signer: phones refuse it as an update of a published app. Rotation does not help: the JAR "
+    "signature stays the first key's."};
 inline constexpr Cause kExponentRefused = {"exponent-refused", Group::kSignature,
     Severity::kRefused, ChainLink::kKey, "`RSA could not set key`",
     "its RSA key has the public exponent %s, with which anyone can make its signatures",
@@ -180,13 +218,14 @@ inline constexpr Cause kCertificateIssued = {"certificate-issued", Group::kSigna
     Severity::kRefused, ChainLink::kCertificate, "`RSA could not verify certificate`",
     "its certificate was issued by another (%s), and this tool takes self-signed ones alone",
     "Sign it with a self-signed certificate: keytool -genkeypair -keyalg RSA -sigalg "
-    "SHA256withRSA."};
+    "SHA256withRSA. That is another signer: phones refuse it as an update of a published app."};
 inline constexpr Cause kCertificateDigest = {"certificate-digest", Group::kSignature,
     Severity::kRefused, ChainLink::kCertificate, "`RSA could not verify certificate`",
     "its certificate is signed with %s, and this tool reads MD5, SHA-1 and SHA-256 with RSA",
-    "Make a certificate for the same key with SHA-256: keytool -selfcert -sigalg SHA256withRSA. "
-    "Without -sigalg keytool takes SHA-384: that of JDK 21 for every RSA key, that of JDK 17 for "
-    "keys of more than 3072 bits."};
+    "Certify the same key with SHA-256, and sign again: keytool -selfcert -alias ALIAS -sigalg "
+    "SHA256withRSA -validity 10000 -keystore KEYSTORE. That is another signer: phones refuse it as "
+    "an update of a published app. Without -sigalg keytool takes SHA-384: that of JDK 21 for every "
+    "RSA key, that of JDK 17 for keys of more than 3072 bits."};
 inline constexpr Cause kCertificateChanged = {"certificate-changed", Group::kSignature,
     Severity::kRefused, ChainLink::kCertificate, "`RSA could not verify certificate`",
     "its certificate does not carry a signature by its own key",
@@ -259,6 +298,11 @@ inline constexpr Cause kLibraryChanged = {"library-changed", Group::kLibrary, Se
     ChainLink::kEntries, "`VeltSignJni: File not verified`",
     "its bytes are not those that the manifest lists",
     "The file beside the package was changed after it was installed. Install the package again."};
+inline constexpr Cause kLibraryChangedInside = {"library-changed-inside", Group::kLibrary,
+    Severity::kRefused, ChainLink::kEntries, "`VeltSignJni: File not verified`",
+    "the package's own copy of it is not what its manifest lists",
+    "Sign the package again, as the last step that changes it. If nobody changed it: do not trust "
+    "it."};
 inline constexpr Cause kLibraryNotListed = {"library-not-listed", Group::kLibrary,
     Severity::kRefused, ChainLink::kEntries, "`Can't find file in`",
     "the manifest does not list it: it was added after signing",
@@ -283,7 +327,15 @@ inline constexpr Cause kLibraryInPackage = {"library-in-package", Group::kLibrar
 inline constexpr Cause kLibraryNotInstalled = {"library-not-installed", Group::kLibrary,
     Severity::kAbsent, ChainLink::kNone, "`Can't open file`",
     "no libraries for its processor lie beside the package", "Nothing, where the phone is of "
-    "another kind. For a package that lies alone: --install; for all processors: --install=all."};
+    "another kind. To lay out those of all processors: --install=all."};
+inline constexpr Cause kLibraryNotLaidOut = {"library-not-laid-out", Group::kLibrary,
+    Severity::kNothing, ChainLink::kNone, "`Can't open file`",
+    "it is for another processor than the phone's (--install=all lays out those of all)",
+    "Nothing: phones install the libraries of one processor."};
+inline constexpr Cause kLibraryInSubdirectory = {"library-in-subdirectory", Group::kLibrary,
+    Severity::kAbsent, ChainLink::kNone, "`Can't open file`",
+    "it is in a subdirectory of its ABI: the tool looks for %s, and installers do not put it there",
+    "Build the package again with its libraries as lib/ABI/NAME."};
 inline constexpr Cause kLibraryMissing = {"library-missing", Group::kLibrary, Severity::kAbsent,
     ChainLink::kNone, "`Can't open file`", "it does not lie beside the package, where others are",
     "Install the package again, unless the installer leaves it out on purpose."};
@@ -299,7 +351,7 @@ inline constexpr Cause kLibraryLeased = {"library-leased", Group::kLibrary, Seve
     ChainLink::kNone, "`Can't open file`", "another process holds a lease on it",
     "Have that process close the file, and run again; /proc/locks names it by its number."};
 inline constexpr Cause kLibraryNotExtracted = {"library-not-extracted", Group::kLibrary,
-    Severity::kRefused, ChainLink::kEntries, "", "--install cannot extract it from the package",
+    Severity::kRefused, ChainLink::kEntries, "", "it cannot be extracted from the package",
     "Copy or build the package again; unzip -t names the fault."};
 inline constexpr Cause kLibraryBehindDamage = {"library-behind-damage", Group::kLibrary,
     Severity::kRefused, ChainLink::kNone, "",
@@ -323,6 +375,40 @@ inline constexpr Cause kToolFailed = {"tool-failed", Group::kTool, Severity::kRe
 inline constexpr Cause kToolError = {"tool-error", Group::kTool, Severity::kRefused,
     ChainLink::kEntries, "", "it logged an error: %s", "docs/messages.md has every message."};
 
+// ---- The installer of the phones.
+inline constexpr Cause kNotInstallable = {"not-installable", Group::kInstaller, Severity::kRefused,
+    ChainLink::kNone, "", "phones do not install it: %s",
+    "Sign the package again, as the last step that changes it. If it is not of your making: do not "
+    "trust it. apksigner verify --min-sdk-version 27 names every fault."};
+inline constexpr Cause kNotInstallableOnSome = {"not-installable-on-some", Group::kInstaller,
+    Severity::kRefused, ChainLink::kNone, "", "phones of %s",
+    "Sign it so that all of these phones take it, as apksigner does by itself. If it is for some "
+    "of them alone: --api names those."};
+inline constexpr Cause kInstallerGaveUp = {"installer-gave-up", Group::kInstaller,
+    Severity::kRefused, ChainLink::kNone, "", "the installer's verifier gave up: %s", "Do not "
+    "trust this package, if it is not of your making. A large one may need a larger --timeout; "
+    "--installer=off judges without the installer."};
+
+// ---- The gate: what the command line demands.
+inline constexpr Cause kSignerUnexpected = {"signer-unexpected", Group::kGate, Severity::kRefused,
+    ChainLink::kNone, "", "its signer is none that --signer names: %s",
+    "Sign it with the key that --signer names; a rotated key has to be named as well. If it is not "
+    "of your making: do not trust it."};
+inline constexpr Cause kSignerNone = {"signer-none", Group::kGate, Severity::kRefused,
+    ChainLink::kNone, "", "it has no signer: the kernel trusts the JAR by its bytes (%s)",
+    "Look at JARs without --signer."};
+inline constexpr Cause kSignerNotVerified = {"signer-not-verified", Group::kGate,
+    Severity::kFollows, ChainLink::kNone, "", "its signer is not known: the tool verified no "
+    "signature (%s)", "Fix what the file is refused for; this follows."};
+inline constexpr Cause kSignerDiffers = {"signer-differs", Group::kGate, Severity::kRefused,
+    ChainLink::kNone, "", "the files of a package must have one signer: %s",
+    "Sign all files of the package with one key and certificate. Look at other builds of it in "
+    "runs of their own."};
+
+inline constexpr Cause kWarningsRefused = {"warnings-refused", Group::kGate, Severity::kRefused,
+    ChainLink::kNone, "", "a warning counts as a refusal (--werror): %s",
+    "See what to do about each warning."};
+
 // ---- Warnings: all may be signed, and yet.
 inline constexpr Cause kOtherKey = {"other-key", Group::kWarning, Severity::kWarning,
     ChainLink::kNone, "", "%s is of another key than the JAR signature: phones install the package "
@@ -341,12 +427,38 @@ inline constexpr Cause kSeveralSigners = {"several-signers", Group::kWarning, Se
 inline constexpr Cause kForgeableKey = {"forgeable-key", Group::kWarning, Severity::kWarning,
     ChainLink::kNone, "", "the key has the public exponent %s: anyone can make its signatures",
     "Do not trust this package. A key of one's own has the exponent 65537."};
+inline constexpr Cause kEntriesChanged = {"entries-changed", Group::kWarning, Severity::kWarning,
+    ChainLink::kNone, "", "%s: other than the manifest lists, and the tool does not look there",
+    "Sign the package again, as the last step that changes it. If it is not of your making: do not "
+    "trust it."};
+inline constexpr Cause kEntriesMissing = {"entries-missing", Group::kWarning, Severity::kWarning,
+    ChainLink::kNone, "", "%s: in the manifest and not in the package",
+    "Sign the package again, as the last step that changes it. If it is not of your making: do not "
+    "trust it."};
+inline constexpr Cause kEntriesNotCompared = {"entries-not-compared", Group::kWarning,
+    Severity::kAlarm, ChainLink::kNone, "", "%s not compared with the manifest: unreadable, too "
+    "long, of another digest than SHA-1 and SHA-256, or the time was up",
+    "unzip -t names an unreadable entry. Run it again with a larger --timeout. Entries above 512 MiB are not compared."};
+inline constexpr Cause kWeakKey = {"weak-key", Group::kWarning, Severity::kWarning,
+    ChainLink::kNone, "", "its RSA key has %s bits, and 2048 are the least that is safe",
+    "Sign a new app with a key of 2048 bits or more. For a published one that is another signer."};
+inline constexpr Cause kDebugKey = {"debug-key", Group::kWarning, Severity::kWarning,
+    ChainLink::kNone, "", "it is signed with a debug certificate (CN=Android Debug), of which each "
+    "workstation makes its own", "Sign a release with a key of its own."};
+inline constexpr Cause kWeakDigest = {"weak-digest", Group::kWarning, Severity::kWarning,
+    ChainLink::kNone, "", "SHA-1 or MD5 is in use: %s",
+    "Sign it again with SHA-256: apksigner does so with --min-sdk-version 18. Certify the key of a "
+    "new app with SHA-256 as well; for a published one that makes another signer."};
+inline constexpr Cause kCertificateExpired = {"certificate-expired", Group::kWarning,
+    Severity::kWarning, ChainLink::kNone, "", "its certificate expired on %s",
+    "Phones install it all the same, and a new certificate makes another signer of a published "
+    "app. Make the one of a new app to last: keytool -validity 10000."};
 inline constexpr Cause kUnlistedEntries = {"unlisted-entries", Group::kWarning, Severity::kWarning,
     ChainLink::kNone, "", "the signature does not protect %s: no digest in the manifest",
     "Sign the package again, as the last step that changes it; --verbose lists them."};
 inline constexpr Cause kNotLaidOut = {"not-laid-out", Group::kWarning, Severity::kWarning,
-    ChainLink::kNone, "", "--install leaves out %s",
-    "An installer takes files of the form lib/ABI/NAME that can be extracted."};
+    ChainLink::kNone, "", "an installer leaves out %s",
+    "Build the package again with its libraries as lib/ABI/NAME."};
 inline constexpr Cause kCertificateOtherKey = {"certificate-other-key", Group::kWarning,
     Severity::kAlarm, ChainLink::kNone, "",
     "its certificate shows another key than the tool reads: %s", "Do not trust this package, if it "
@@ -365,6 +477,9 @@ inline constexpr Cause kFileChanged = {"file-changed", Group::kWarning, Severity
 inline constexpr Cause kNotLookedInto = {"not-looked-into", Group::kWarning, Severity::kAlarm,
     ChainLink::kNone, "", "%s is too large to be looked into, and nothing is told of it",
     "Do not trust this package, if it is not of your making: those of real packages are small."};
+inline constexpr Cause kEntriesEncrypted = {"entries-encrypted", Group::kWarning, Severity::kDoubt,
+    ChainLink::kNone, "", "%s: encrypted, and no phone decrypts it",
+    "Build the package again without a password."};
 inline constexpr Cause kEntriesDamaged = {"entries-damaged", Group::kWarning, Severity::kDoubt,
     ChainLink::kNone, "", "the archive is damaged at %s, which nobody can read",
     "Copy or build the package again; unzip -t names the fault."};

@@ -18,8 +18,8 @@ struct Library {
 std::vector<Library> MatchAttempts(const RunRecord& run, const std::vector<LibraryFacts>& present);
 Reason WhyNotSigned(const Library& library, const RunRecord& run, const PackageFacts& facts,
                     bool is_walked);
-Reason WhyNotVerified(const Library& library, const PackageFacts& facts);
-Reason WhyNotThere(const LibraryFacts& library, const PackageFacts& facts);
+Reason WhyNotVerified(const Library& library, const RunRecord& run, const PackageFacts& facts);
+Reason WhyNotThere(const LibraryFacts& library, const RunRecord& run, const PackageFacts& facts);
 
 }  // namespace
 
@@ -71,7 +71,7 @@ std::vector<Library> MatchAttempts(const RunRecord& run, const std::vector<Libra
   }
   if (attempt == run.libraries.end()) return libraries;
   libraries.clear();
-  const std::string directory = run.path.substr(0, run.path.rfind('/') + 1);
+  const std::string directory = run.PathForTool().substr(0, run.PathForTool().rfind('/') + 1);
   for (const Attempt& each : run.libraries) {
     const bool is_below = each.path.compare(0, directory.size(), directory) == 0;
     Library library;
@@ -92,7 +92,8 @@ Reason WhyNotSigned(const Library& library, const RunRecord& run, const PackageF
   }
   if (library.attempt != nullptr) {
     const Attempt& attempt = *library.attempt;
-    if (attempt.outcome == Attempt::Outcome::kNotVerified) return WhyNotVerified(library, facts);
+    if (attempt.outcome == Attempt::Outcome::kNotVerified)
+      return WhyNotVerified(library, run, facts);
     if (attempt.outcome == Attempt::Outcome::kVanished) {
       return {&cause::kLibraryNotOpened, DescribeErrno(attempt.error)};
     }
@@ -101,21 +102,26 @@ Reason WhyNotSigned(const Library& library, const RunRecord& run, const PackageF
   if (found.place.empty()) return {&cause::kLibraryOtherAbi, ""};
   if (!is_walked) return {&cause::kPackageRefused, ""};
   if (found.is_met) return {&cause::kNotReached, ""};
-  if (found.error != 0) return WhyNotThere(found, facts);
+  if (found.error != 0) return WhyNotThere(found, run, facts);
   return {&cause::kLibraryBehindDamage, ""};
 }
 
-Reason WhyNotVerified(const Library& library, const PackageFacts& facts) {
+Reason WhyNotVerified(const Library& library, const RunRecord& run, const PackageFacts& facts) {
   const LogMeaning why = library.attempt->why;
-  if (why == LogMeaning::kFileNotOpened) return WhyNotThere(library.facts, facts);
+  if (why == LogMeaning::kFileNotOpened) return WhyNotThere(library.facts, run, facts);
   if (why == LogMeaning::kFileNotRead) return {&cause::kLibraryNoFile, ""};
   if (why == LogMeaning::kNotListed) return {&cause::kLibraryNotListed, ""};
   if (why == LogMeaning::kDigestUnknown) return {&cause::kLibraryDigest, ""};
-  return {&cause::kLibraryChanged, ""};
+  const std::string& name = library.facts.entry;
+  const bool is_changed_inside =
+      std::any_of(facts.entries.begin(), facts.entries.end(), [&](const ListedEntry& each) {
+        return each.entry.name == name && each.digest == EntryDigest::kDiffers;
+      });
+  return {is_changed_inside ? &cause::kLibraryChangedInside : &cause::kLibraryChanged, ""};
 }
 
 // The tool does not log why a file does not open; the file system still knew.
-Reason WhyNotThere(const LibraryFacts& library, const PackageFacts& facts) {
+Reason WhyNotThere(const LibraryFacts& library, const RunRecord& run, const PackageFacts& facts) {
   const int error = library.error;
   if (error == EACCES || error == EPERM) return {&cause::kLibraryNoPermission, ""};
   if (error == EWOULDBLOCK) return {&cause::kLibraryLeased, ""};
@@ -124,6 +130,11 @@ Reason WhyNotThere(const LibraryFacts& library, const PackageFacts& facts) {
     return {&cause::kLibraryNotOpened, DescribeErrno(error)};
   }
   if (facts.manifest.extracts_libraries == false) return {&cause::kLibraryInPackage, ""};
+  // lib/arm64/NAME is where an installer puts it.
+  if (std::count(library.place.begin(), library.place.end(), '/') > 2) {
+    return {&cause::kLibraryInSubdirectory, library.place};
+  }
+  if (run.of_other_processors.count(library.entry) > 0) return {&cause::kLibraryNotLaidOut, ""};
   return {library.has_directory ? &cause::kLibraryMissing : &cause::kLibraryNotInstalled, ""};
 }
 

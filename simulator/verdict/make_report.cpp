@@ -14,25 +14,31 @@ namespace {
 
 Item OwnItem(const RunRecord& run, const PackageFacts& facts, const JudgeOptions& options);
 ItemKind KindOf(const RunRecord& run);
-Reason WhyJarRefused(const RunRecord& run);
+Reason WhyJarRefused(const RunRecord& run, const PackageFacts& facts);
 Reason WhyFailed(const Failure& failure);
 void AddKeyItems(const RunRecord& run, const JudgeOptions& options, std::vector<Item>* items);
 void AddToolItems(const RunRecord& run, const JudgeOptions& options, std::vector<Item>* items);
 Verdict Judge(const std::vector<Item>& items);
+Verdict JudgeWithInstaller(Verdict verdict, const Report& report);
 void DescribeSigners(const RunRecord& run, const PackageFacts& facts, Report* report);
 void AddWarnings(const std::vector<Reason>& warnings, const JudgeOptions& options, Report* report);
 
 }  // namespace
 
-Report MakeReport(const RunRecord& run, const PackageFacts& facts, const JudgeOptions& options) {
+Report MakeReport(const RunRecord& run, const PackageFacts& facts, const JudgeOptions& options,
+                  const Judgement& installer) {
   Report report;
   report.file = run.file;
   report.path = run.path;
+  report.installed = run.installed;
   report.events = run.events;
+  report.installer = installer;
   report.file_size = facts.size;
+  report.file_sha256 = facts.sha256;
+  report.tool = run.tool;
   Reason failure = WhyFailed(run.failure);
   if (failure.cause == nullptr && run.is_silent && !run.signal) {
-    const Reason unseen = WhyNotLookedAt(facts, run.has_standard_input);
+    const Reason unseen = WhyNotLookedAt(run, facts);
     if (run.status != 0) {
       failure = {&cause::kToolFailed, std::to_string(run.status)};
     } else if (unseen.cause == nullptr) {
@@ -52,9 +58,10 @@ Report MakeReport(const RunRecord& run, const PackageFacts& facts, const JudgeOp
   AddLibraryItems(run, facts, options, &report.items);
   AddKeyItems(run, options, &report.items);
   AddToolItems(run, options, &report.items);
+  if (own.kind == ItemKind::kPackage) AddInstallerItem(installer, options, &report.items);
   DescribeSigners(run, facts, &report);
-  AddWarnings(FindWarnings(run, facts, report), options, &report);
-  report.verdict = Judge(report.items);
+  AddWarnings(FindWarnings(run, facts, report, options.now), options, &report);
+  report.verdict = JudgeWithInstaller(Judge(report.items), report);
   report.protection = FindProtection(facts, report.items);
   if (own.kind == ItemKind::kPackage) report.chain = MakeChain(facts, report);
   return report;
@@ -76,9 +83,22 @@ std::string Reason::Text() const {
   return at == std::string::npos ? text : text.replace(at, 2, detail);
 }
 
+// The verdict is the installer's where the tool signed, and the tool's or the simulation's
+// elsewhere.
+const Item* DecisiveItem(const Report& report) {
+  const bool is_installers = report.verdict == Verdict::kNotInstallable ||
+                             (report.verdict == Verdict::kNotSimulated && report.items.size() > 1);
+  for (const Item& item : report.items) {
+    const bool counts = !is_installers || item.kind == ItemKind::kInstaller;
+    if (counts && item.state == ItemState::kRefused) return &item;
+  }
+  return nullptr;
+}
+
 ExitStatus StatusOf(Verdict verdict) {
-  constexpr ExitStatus kStatuses[] = {kAllSigned,   kAllSigned,   kSomeRefused,   kSomeRefused,
-                                      kSomeRefused, kNotLookedAt, kCannotSimulate};
+  constexpr ExitStatus kStatuses[] = {kAllSigned,   kAllSigned,     kAllSigned,   kSomeRefused,
+                                      kSomeRefused, kSomeRefused,   kSomeRefused, kSomeRefused,
+                                      kNotLookedAt, kCannotSimulate};
   return kStatuses[static_cast<size_t>(verdict)];
 }
 
@@ -91,13 +111,13 @@ Item OwnItem(const RunRecord& run, const PackageFacts& facts, const JudgeOptions
   const char* const name = kNames[static_cast<size_t>(kind)];
   Reason reason;
   if (run.verify_error.value_or(0) != 0) {
-    reason = WhyJarRefused(run);
+    reason = WhyJarRefused(run, facts);
   } else if (run.own) {
     reason = WhyKernelDidNotSign(*run.own);
   } else if (run.signal) {
     reason = {&cause::kNotReached, ""};
   } else {
-    reason = run.is_jar ? WhyJarRefused(run) : WhyRefused(run, facts);
+    reason = run.is_jar ? WhyJarRefused(run, facts) : WhyRefused(run, facts);
   }
   Item item = {kind, name, "", ItemState::kDone, {}};
   if (reason.cause != nullptr) item = NotDone(kind, name, reason, options);
@@ -114,11 +134,13 @@ ItemKind KindOf(const RunRecord& run) {
   return is_archive ? ItemKind::kPackage : ItemKind::kFile;
 }
 
-Reason WhyJarRefused(const RunRecord& run) {
+Reason WhyJarRefused(const RunRecord& run, const PackageFacts& facts) {
   const LogLine* const line = FindError(run.opening_errors, LogMeaning::kNoAndroidManifest);
   if (line != nullptr && line->text != ErrorCodeString(ApkTools::kZipEntryNotFound)) {
     return {&cause::kAndroidManifestDamaged, ""};
   }
+  const Reason taken_for_a_jar = WhyTakenForAJar(facts);
+  if (taken_for_a_jar.cause != nullptr) return taken_for_a_jar;
   return {&cause::kJarNotTrusted, DescribeErrno(run.verify_error.value_or(0))};
 }
 
@@ -167,9 +189,11 @@ void AddToolItems(const RunRecord& run, const JudgeOptions& options, std::vector
   }
 }
 
-// The first item is the file itself.
+// By what the tool did alone. The first item is the file itself.
 Verdict Judge(const std::vector<Item>& items) {
-  const auto is_refused = [](const Item& item) { return item.state == ItemState::kRefused; };
+  const auto is_refused = [](const Item& item) {
+    return item.state == ItemState::kRefused && item.kind != ItemKind::kInstaller;
+  };
   const auto is_signed = [](const Item& item) {
     return item.state == ItemState::kDone && item.kind != ItemKind::kKey;
   };
@@ -180,6 +204,18 @@ Verdict Judge(const std::vector<Item>& items) {
   }
   const bool is_partly = std::any_of(items.begin(), items.end(), is_signed);
   return is_partly ? Verdict::kPartlySigned : Verdict::kRefused;
+}
+
+// Where the tool signed something, it counts what the phones' installer does with it.
+Verdict JudgeWithInstaller(Verdict verdict, const Report& report) {
+  if (verdict != Verdict::kSigned && verdict != Verdict::kPartlySigned) return verdict;
+  for (const Item& item : report.items) {
+    if (item.kind != ItemKind::kInstaller) continue;
+    const bool has_judged = item.reason.cause != &cause::kInstallerGaveUp;
+    return has_judged ? Verdict::kNotInstallable : Verdict::kNotSimulated;
+  }
+  const bool has_other = OtherSigner(report.installer, report) != nullptr;
+  return verdict == Verdict::kSigned && has_other ? Verdict::kOtherSigner : verdict;
 }
 
 // The key is the one that the kernel got with the package, or else with a library. Where it got

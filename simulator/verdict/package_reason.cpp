@@ -52,14 +52,31 @@ Reason WhyRefused(const RunRecord& run, const PackageFacts& facts) {
   return WhySilentlyRefused(facts);
 }
 
-Reason WhyNotLookedAt(const PackageFacts& facts, bool has_standard_input) {
+Reason WhyNotLookedAt(const RunRecord& run, const PackageFacts& facts) {
   const int error = facts.error;
+  if (run.has_no_packages) return {&cause::kNoPackages, ""};
   if (error == ENOENT) return {&cause::kFileMissing, ""};
   if (error == EACCES || error == EPERM) return {&cause::kFileNoPermission, ""};
   if (error == EWOULDBLOCK) return {&cause::kFileLeased, ""};
   if (error != 0) return {&cause::kFileNotOpened, DescribeErrno(error)};
-  if (!has_standard_input) return {&cause::kStandardInputClosed, ""};
+  if (!run.has_standard_input) return {&cause::kStandardInputClosed, ""};
   if (facts.is_read_only) return {&cause::kReadOnlyFileSystem, ""};
+  return {};
+}
+
+// JARs of the platform have a classes.dex as well, but neither resources nor libraries.
+Reason WhyTakenForAJar(const PackageFacts& facts) {
+  std::string part;
+  bool has_packages = false;
+  for (const ListedEntry& each : facts.entries) {
+    const std::string& name = each.entry.name;
+    if (name == "BundleConfig.pb") return {&cause::kAppBundle, ""};
+    has_packages = has_packages || EndsWith(name, ".apk");
+    const bool is_part = name == "resources.arsc" || kLibraryNames.Has(name);
+    if (is_part && part.empty()) part = name;
+  }
+  if (has_packages) return {&cause::kPackageSet, ""};
+  if (!part.empty()) return {&cause::kPackageWithoutManifest, part};
   return {};
 }
 
@@ -77,7 +94,11 @@ Reason WhyNotOpened(const PackageFacts& facts, int64_t code) {
       nullptr,           &cause::kFolder,     &cause::kSpecialFile, &cause::kEmptyFile,
       &cause::kTextFile, &cause::kCutArchive, &cause::kNoArchive,   nullptr};
   const Cause* const why = kCauses[static_cast<size_t>(facts.kind)];
+  if (facts.packages > 0) {
+    return {&cause::kPackageDirectory, Counted(facts.packages, "package", "packages")};
+  }
   if (why != nullptr) return {why, ""};
+  if (!facts.entry_twice.empty()) return {&cause::kEntryTwice, facts.entry_twice};
   return {code == kNoEntries ? &cause::kEmptyArchive : &cause::kDamagedArchive, ""};
 }
 

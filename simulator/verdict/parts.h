@@ -1,5 +1,5 @@
 // The parts of a report, each made by a file of its own: package_reason.cpp, library_items.cpp,
-// warnings.cpp and protection.cpp.
+// installer_item.cpp, warnings.cpp and protection.cpp.
 #pragma once
 
 #include <vector>
@@ -13,8 +13,13 @@ namespace simulator {
 // JAR.
 Reason WhyRefused(const RunRecord& run, const PackageFacts& facts);
 
-// For a file that the tool did not look at; a null cause when it had no reason not to.
-Reason WhyNotLookedAt(const PackageFacts& facts, bool has_standard_input);
+// For a file that the tool did not look at, or a directory that it was not run for; a null cause
+// when there was no reason not to.
+Reason WhyNotLookedAt(const RunRecord& run, const PackageFacts& facts);
+
+// What an archive without AndroidManifest.xml is, where it was hardly meant for a JAR; a null cause
+// for what may be one.
+Reason WhyTakenForAJar(const PackageFacts& facts);
 
 // Why the kernel did not sign the file; a null cause when it did.
 Reason WhyKernelDidNotSign(const Attempt& attempt);
@@ -24,10 +29,19 @@ Reason WhyKernelDidNotSign(const Attempt& attempt);
 void AddLibraryItems(const RunRecord& run, const PackageFacts& facts, const JudgeOptions& options,
                      std::vector<Item>* items);
 
+// Adds an item if phones of some levels do not install the package, or if that could not be found
+// out.
+void AddInstallerItem(const Judgement& judgement, const JudgeOptions& options,
+                      std::vector<Item>* items);
+
+// Whether the key is the JAR signer's, as the kernel gets it and as the certificate shows it.
+bool IsJarSigner(const PublicKey& key, const Report& report);
+
 // Facts that matter to the user although they change nothing for the kernel. Of the report the
-// items, the signers and the key are filled. A fact of the file's own item is not told twice.
+// items, the signers and the key are filled. A fact of the file's own item is not told twice. `now`
+// is that of JudgeOptions.
 std::vector<Reason> FindWarnings(const RunRecord& run, const PackageFacts& facts,
-                                 const Report& report);
+                                 const Report& report, int64_t now = 0);
 
 // What a package's signature protects, by bytes. `items` are the report's, the package's own first.
 Protection FindProtection(const PackageFacts& facts, const std::vector<Item>& items);

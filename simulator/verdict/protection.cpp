@@ -1,6 +1,6 @@
 // What a package's signature protects.
 #include <algorithm>
-#include <set>
+#include <map>
 #include <string>
 
 #include "simulator/verdict/parts.h"
@@ -8,22 +8,43 @@
 
 namespace simulator {
 
-Protection FindProtection(const PackageFacts& facts, const std::vector<Item>& items) {
-  std::set<std::string> verified;
+namespace {
+
+// At which entries the tool looked, and whether it found them as they are listed. Of a library it
+// looks at the file beside the package.
+std::map<std::string, bool> EntriesSeen(const std::vector<Item>& items) {
+  std::map<std::string, bool> seen;
   for (const Item& item : items) {
-    if (!item.is_verified) continue;
-    verified.insert(item.kind == ItemKind::kPackage ? "classes.dex" : item.entry);
+    const Cause* const why = item.reason.cause;
+    const bool has_differed = why == &cause::kDexChanged || why == &cause::kLibraryChanged ||
+                              why == &cause::kLibraryChangedInside;
+    if (!item.is_verified && !has_differed) continue;
+    seen[item.kind == ItemKind::kPackage ? "classes.dex" : item.entry] = item.is_verified;
   }
+  return seen;
+}
+
+}  // namespace
+
+Protection FindProtection(const PackageFacts& facts, const std::vector<Item>& items) {
+  const std::map<std::string, bool> seen = EntriesSeen(items);
   Protection protection;
+  protection.missing_names = facts.missing;
   for (const ListedEntry& entry : facts.entries) {
-    Share* share = &protection.unlisted;
+    const std::string& name = entry.entry.name;
+    const auto look = seen.find(name);
+    Share* share = &protection.uncompared;
     if (entry.is_signature) {
       share = &protection.signature;
-    } else if (entry.is_listed) {
-      const bool is_verified = verified.count(entry.entry.name) > 0;
-      share = is_verified ? &protection.verified : &protection.vouched;
-    } else {
-      protection.unlisted_names.push_back(entry.entry.name);
+    } else if (!entry.is_listed) {
+      share = &protection.unlisted;
+      protection.unlisted_names.push_back(name);
+    } else if (entry.digest == EntryDigest::kDiffers) {
+      share = &protection.differing;
+      protection.differing_names.push_back(name);
+      protection.differing_seen += look != seen.end() ? 1 : 0;
+    } else if (entry.digest == EntryDigest::kMatches) {
+      share = look != seen.end() && look->second ? &protection.verified : &protection.vouched;
     }
     ++share->entries;
     share->bytes += entry.entry.size;

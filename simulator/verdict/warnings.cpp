@@ -1,5 +1,6 @@
 // What is worth a second look.
 #include <algorithm>
+#include <ctime>
 
 #include "simulator/verdict/parts.h"
 #include "simulator/verdict/wording.h"
@@ -12,21 +13,25 @@ using Reasons = std::vector<Reason>;
 
 void WarnOfTwoFaces(const PackageFacts& facts, const Report& report, Reasons* warnings);
 void WarnOfSigners(const PackageFacts& facts, const Report& report, Reasons* warnings);
+void WarnOfWeakDigests(const PackageFacts& facts, Reasons* warnings);
+void WarnOfExpiry(const JarSignatureFacts& jar, int64_t now, Reasons* warnings);
 void WarnOfOtherKeys(const PackageFacts& facts, const Report& report, Reasons* warnings);
-bool IsJarSigner(const PublicKey& key, const Report& report);
 void WarnOfStrippedSchemes(const PackageFacts& facts, Reasons* warnings);
-void WarnOfEntries(const PackageFacts& facts, Reasons* warnings);
+void WarnOfEntries(const PackageFacts& facts, const Report& report, Reasons* warnings);
+bool IsSaid(const std::string& entry, const Report& report);
 
 }  // namespace
 
 std::vector<Reason> FindWarnings(const RunRecord& run, const PackageFacts& facts,
-                                 const Report& report) {
+                                 const Report& report, int64_t now) {
   Reasons warnings;
   const bool is_package = report.items[0].kind == ItemKind::kPackage;
   if (facts.was_changed) warnings.push_back({&cause::kFileChanged, ""});
   if (is_package) {
     WarnOfTwoFaces(facts, report, &warnings);
     WarnOfSigners(facts, report, &warnings);
+    WarnOfWeakDigests(facts, &warnings);
+    WarnOfExpiry(facts.jar, now, &warnings);
     WarnOfOtherKeys(facts, report, &warnings);
     WarnOfStrippedSchemes(facts, &warnings);
   }
@@ -34,11 +39,16 @@ std::vector<Reason> FindWarnings(const RunRecord& run, const PackageFacts& facts
   for (const std::string& what : facts.too_long) {
     warnings.push_back({&cause::kNotLookedInto, what});
   }
-  if (is_package) WarnOfEntries(facts, &warnings);
+  if (is_package) WarnOfEntries(facts, report, &warnings);
   if (!run.not_laid_out.empty()) {
     warnings.push_back({&cause::kNotLaidOut, CountedNames(run.not_laid_out)});
   }
   return warnings;
+}
+
+bool IsJarSigner(const PublicKey& key, const Report& report) {
+  if (report.key && key.modulus_sha256 != report.key->sha256) return false;
+  return !report.signer || key.sha256 == report.signer->key.sha256;
 }
 
 namespace {
@@ -69,9 +79,50 @@ void WarnOfSigners(const PackageFacts& facts, const Report& report, Reasons* war
   if (!is_said && jar.key && jar.key->is_forgeable) {
     warnings->push_back({&cause::kForgeableKey, std::to_string(jar.key->exponent)});
   }
+  constexpr int kSafeBits = 2048;
+  if (jar.key && jar.key->bits < kSafeBits) {
+    warnings->push_back({&cause::kWeakKey, std::to_string(jar.key->bits)});
+  }
+  const std::string subject = jar.certificate ? jar.certificate->subject : "";
+  if ((subject + ",").find("CN=Android Debug,") != std::string::npos) {
+    warnings->push_back({&cause::kDebugKey, ""});
+  }
   if (jar.signature_files.size() > 1 || jar.block.signer_count > 1) {
     warnings->push_back({&cause::kSeveralSigners, jar.signature_files[0]});
   }
+}
+
+// Wherever a digest of the JAR signature is one of those for which collisions are known.
+void WarnOfWeakDigests(const PackageFacts& facts, Reasons* warnings) {
+  const auto is_weak = [](const std::string& name) {
+    return name.compare(0, 4, "SHA1") == 0 || name.compare(0, 3, "MD5") == 0;
+  };
+  const JarSignatureFacts& jar = facts.jar;
+  std::vector<std::string> uses;
+  if (jar.certificate && is_weak(jar.certificate->signature_algorithm)) {
+    uses.push_back("the certificate is signed with " + jar.certificate->signature_algorithm);
+  }
+  if (is_weak(jar.block.digest))
+    uses.push_back("the signature block is made with " + jar.block.digest);
+  if (jar.has_sha1_of_manifest)
+    uses.emplace_back("the signature file has the manifest's SHA-1 digest");
+  const auto count = std::count_if(facts.entries.begin(), facts.entries.end(),
+                                   [](const ListedEntry& each) { return each.has_sha1; });
+  if (count > 0) {
+    const std::string entries = Counted(static_cast<uint64_t>(count), "entry", "entries");
+    uses.push_back("the manifest has SHA-1 digests of " + entries);
+  }
+  if (!uses.empty()) warnings->push_back({&cause::kWeakDigest, Joined(uses)});
+}
+
+void WarnOfExpiry(const JarSignatureFacts& jar, int64_t now, Reasons* warnings) {
+  if (!jar.certificate || !jar.certificate->not_after) return;
+  if (*jar.certificate->not_after >= now) return;
+  const time_t end = *jar.certificate->not_after;
+  struct tm parts = {};
+  char text[80] = "";
+  if (gmtime_r(&end, &parts) != nullptr) strftime(text, sizeof(text), "%F %T UTC", &parts);
+  warnings->push_back({&cause::kCertificateExpired, text});
 }
 
 // One warning for a scheme that has another signer than the JAR signature.
@@ -90,11 +141,6 @@ void WarnOfOtherKeys(const PackageFacts& facts, const Report& report, Reasons* w
   }
 }
 
-bool IsJarSigner(const PublicKey& key, const Report& report) {
-  if (report.key && key.modulus_sha256 != report.key->sha256) return false;
-  return !report.signer || key.sha256 == report.signer->key.sha256;
-}
-
 // The signature file names the schemes by their numbers: "2, 3".
 void WarnOfStrippedSchemes(const PackageFacts& facts, Reasons* warnings) {
   const std::vector<std::string> present = NewerSchemes(facts);
@@ -107,21 +153,48 @@ void WarnOfStrippedSchemes(const PackageFacts& facts, Reasons* warnings) {
   if (!missing.empty()) warnings->push_back({&cause::kSchemesStripped, Joined(missing)});
 }
 
-void WarnOfEntries(const PackageFacts& facts, Reasons* warnings) {
+void WarnOfEntries(const PackageFacts& facts, const Report& report, Reasons* warnings) {
   const bool has_list = facts.jar.manifest == Archive::ReadResult::kRead;
   uint64_t unlisted = 0;
   uint64_t bytes = 0;
-  std::vector<std::string> damaged;
+  std::vector<std::string> damaged, encrypted, changed, uncompared;
   for (const ListedEntry& each : facts.entries) {
-    if (each.entry.is_damaged) damaged.push_back(each.entry.name);
+    if (each.entry.is_encrypted) {
+      encrypted.push_back(each.entry.name);
+    } else if (each.entry.is_damaged) {
+      damaged.push_back(each.entry.name);
+    }
+    const bool is_lost = each.digest == EntryDigest::kNotCompared && !each.entry.is_damaged &&
+                         !each.entry.is_encrypted;
+    if (is_lost) uncompared.push_back(each.entry.name);
+    if (each.digest == EntryDigest::kDiffers && !IsSaid(each.entry.name, report)) {
+      changed.push_back(each.entry.name);
+    }
     if (!has_list || each.is_listed || each.is_signature) continue;
     ++unlisted;
     bytes += each.entry.size;
   }
+  if (!encrypted.empty()) warnings->push_back({&cause::kEntriesEncrypted, CountedNames(encrypted)});
   if (!damaged.empty()) warnings->push_back({&cause::kEntriesDamaged, CountedNames(damaged)});
+  if (!changed.empty()) warnings->push_back({&cause::kEntriesChanged, CountedNames(changed)});
+  if (!facts.missing.empty()) {
+    warnings->push_back({&cause::kEntriesMissing, CountedNames(facts.missing)});
+  }
+  if (!uncompared.empty()) {
+    warnings->push_back({&cause::kEntriesNotCompared, CountedNames(uncompared)});
+  }
   if (unlisted == 0) return;
   warnings->push_back({&cause::kUnlistedEntries, Counted(unlisted, "entry", "entries") + " (" +
                                                      Counted(bytes, "byte", "bytes") + ")"});
+}
+
+// Whether an item says of the entry already that it is not the one that was signed.
+bool IsSaid(const std::string& entry, const Report& report) {
+  return std::any_of(report.items.begin(), report.items.end(), [&](const Item& item) {
+    const Cause* const why = item.reason.cause;
+    return (why == &cause::kDexChanged && entry == "classes.dex") ||
+           (why == &cause::kLibraryChangedInside && item.entry == entry);
+  });
 }
 
 }  // namespace

@@ -27,6 +27,13 @@ inline std::string CountedNames(const std::vector<std::string>& names) {
          (names.size() > 1 ? ", ..." : "");
 }
 
+// Such as "API 27 and later".
+std::string LevelText(const LevelRange& levels);
+
+// Which phones take the package, and by which schemes they know its signer: "phones of API 27 and
+// later take it, by v2, v3". Empty unless all of those that were asked do.
+std::string TakersText(const Judgement& judgement);
+
 // Such as "RSA-2048", of the JAR signer: as the tool reads the key, else as the certificate shows
 // it. Empty when nobody does.
 inline std::string KeyName(const Report& report) {

@@ -1,6 +1,7 @@
-// Reads every *.mf file of a folder with the JDK's own parser, writes what it found to *.dump, and
-// the manifest anew to *.rewritten. The dump has a line "Section <name>" per section (the main
-// section, without a name, first) and a line "<attribute>: <value>" per attribute, both in order.
+// Reads every *.mf file of a directory with the JDK's own parser. Writes the parsed manifest to
+// *.dump, and the manifest itself, written anew, to *.rewritten. The dump has a line "Section
+// <name>" per section (the main section first, without a name) and a line "<attribute>: <value>"
+// per attribute, in order.
 import java.io.FileInputStream;
 import java.io.FileOutputStream;
 import java.io.IOException;

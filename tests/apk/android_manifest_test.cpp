@@ -1,4 +1,4 @@
-// What is read from the compiled Android manifest.
+// Reading the compiled Android manifest.
 #include <gtest/gtest.h>
 
 #include <algorithm>
@@ -23,7 +23,7 @@ XmlAttribute AndroidValue(const std::string& value) {
   return InAndroidNamespace(StringAttribute("value", value));
 }
 
-// What one document yields; reading it must succeed without a message.
+// The facts of one document. Reading it must succeed without a message.
 struct Facts {
   std::string package_name;
   bool ss_permission_required;
@@ -44,7 +44,7 @@ Facts Read(const CompiledXml& xml) {
   return {apk.GetPackageName(), apk.IsSsPermissionRequired()};
 }
 
-// Whether an element, inside a manifest, asks for the permission.
+// True if the element, inside a manifest, asks for the permission.
 bool Asks(const std::string& element, const std::vector<XmlAttribute>& attributes) {
   CompiledXml xml;
   xml.Start("manifest", {Package("p")}).Element(element, attributes).End("manifest");
@@ -55,7 +55,7 @@ bool Asks(const std::string& element, const std::vector<XmlAttribute>& attribute
 
 // ---- The package's name.
 
-TEST(AndroidManifestPackage, ItIsTheManifestsAttributeInEitherEncoding) {
+TEST(AndroidManifestPackage, TheNameIsTheManifestsAttributeInEitherEncoding) {
   for (const auto pool : {CompiledXml::Pool::kUtf8, CompiledXml::Pool::kUtf16}) {
     EXPECT_EQ(Read(CompiledXml(pool).Element("manifest",
                                              {Package("com.example.\u00fc\u20ac\U0001f600")})),
@@ -100,12 +100,12 @@ TEST(AndroidManifestPackage, AManifestCountsAtAnyDepth) {
             (Facts{"deep", false}));
 }
 
-TEST(AndroidManifestPackage, AReferenceIsNoName) {
+TEST(AndroidManifestPackage, AReferenceIsNotAName) {
   EXPECT_EQ(Read(CompiledXml().Element("manifest", {ReferenceAttribute("package", 0x7f010001)})),
             (Facts{"", false}));
 }
 
-TEST(AndroidManifestPackage, AnIntegerIsNoName) {
+TEST(AndroidManifestPackage, AnIntegerIsNotAName) {
   EXPECT_EQ(Read(CompiledXml().Element("manifest", {IntAttribute("package", 17)})),
             (Facts{"", false}));
 }
@@ -117,7 +117,7 @@ TEST(AndroidManifestPackage, OtherLetterCaseIsAnotherElementOrAttribute) {
             (Facts{"", false}));
 }
 
-TEST(AndroidManifestPackage, ADocumentWithoutManifestHasNone) {
+TEST(AndroidManifestPackage, ADocumentWithoutManifestHasNoName) {
   EXPECT_EQ(Read(CompiledXml().Element("resources")), (Facts{"", false}));
 }
 
@@ -201,7 +201,7 @@ TEST(AndroidManifestPermission, ItStaysSetOnceItIsSet) {
             (Facts{"p", true}));
 }
 
-// ---- Which attribute is read.
+// ---- The attribute that is read.
 
 TEST(AndroidManifestAttribute, NamesMatchInAnyNamespace) {
   EXPECT_TRUE(Asks("uses-permission", {StringAttribute("name", kPermission)}));
@@ -227,8 +227,8 @@ TEST(AndroidManifestAttribute, AStringWithoutTextIsPassedOverForALaterString) {
             (Facts{"b", false}));
 }
 
-// The raw value is the text as it stood in the source; what counts is what it was compiled to.
-TEST(AndroidManifestAttribute, WhatIsNoStringIsMissingThoughItHasARawText) {
+// The raw value is the text in the source. The typed value, to which it was compiled, counts.
+TEST(AndroidManifestAttribute, AnAttributeOfAnotherTypeIsMissingEvenWithARawText) {
   for (XmlAttribute attribute :
        {ReferenceAttribute("package", 0x7f010000), IntAttribute("package", 7)}) {
     attribute.has_raw = true;
@@ -237,7 +237,7 @@ TEST(AndroidManifestAttribute, WhatIsNoStringIsMissingThoughItHasARawText) {
   }
 }
 
-TEST(AndroidManifestAttribute, OneWithoutANameIsPassedOver) {
+TEST(AndroidManifestAttribute, AnAttributeWithoutANameIsPassedOver) {
   XmlAttribute nameless = Package("wrong");
   nameless.has_name = false;
   EXPECT_EQ(Read(CompiledXml().Element("manifest", {nameless, Package("right")})),
@@ -249,10 +249,10 @@ TEST(AndroidManifestAttribute, ALoneStringWithoutTextIsMissing) {
             (Facts{"", false}));
 }
 
-// ---- Documents that are not as they should be.
+// ---- Malformed documents.
 
-// ---- Unpaired surrogates, which the platform drops when it converts a text to UTF-8. Names and
-// values are not converted here, but read as if they were.
+// ---- Unpaired surrogates. The platform drops them when it converts a text to UTF-8. Here names
+// and values are not converted, but compared as if they were.
 
 const std::string kHigh = "\xED\xA0\x80", kLow = "\xED\xB0\x80";  // U+D800, U+DC00
 
@@ -262,7 +262,7 @@ std::string Times(size_t count, const std::string& text) {
   return all;
 }
 
-// What the platform's conversion makes of the text.
+// The text after the platform's conversion.
 std::string Converted(const std::string& text) {
   CompiledXml xml(CompiledXml::Pool::kUtf16);
   return Read(xml.Element("manifest", {Package(text)})).package_name;
@@ -287,13 +287,13 @@ TEST(AndroidManifestSurrogates, AreDroppedFromNamesAndValuesAsByTheConversion) {
   }
 }
 
-TEST(AndroidManifestSurrogates, AShorterNameIsAnotherHoweverManyAreInIt) {
+TEST(AndroidManifestSurrogates, AShorterNameDoesNotMatchWithAnyNumberOfThem) {
   CompiledXml xml(CompiledXml::Pool::kUtf16);
   xml.Element("manifes" + kHigh + kHigh, {Package("p")});
   EXPECT_EQ(Read(xml), (Facts{"", false}));
 }
 
-// Or a hostile document could make each comparison as long as itself.
+// Without this limit, a hostile document could make each comparison as long as itself.
 TEST(AndroidManifestSurrogates, MoreThanSixteenMakeAnotherName) {
   for (const size_t count : {16, 17}) {
     CompiledXml xml(CompiledXml::Pool::kUtf16);
@@ -320,7 +320,7 @@ TEST(AndroidManifestDocument, BytesThatAreNotCompiledXmlFail) {
   ASSERT_TRUE(apk.ParseAndroidManifest(CompiledManifest("before", true)));
   log.Clear();
   EXPECT_FALSE(apk.ParseAndroidManifest(ToBytes("<?xml version='1.0'?><manifest/>")));
-  // 0x80000001: BAD_TYPE of the platform's status codes.
+  // 0x80000001 is BAD_TYPE of the platform's status codes.
   EXPECT_EQ(log.records(), Records({Error("ParseAndroidManifest failed to init xml parser, "
                                           "error=0x80000001\n")}));
   EXPECT_EQ(apk.GetPackageName(), "before");
@@ -336,7 +336,7 @@ TEST(AndroidManifestDocument, NoBytesAtAllFail) {
                                           "error=0x80000001\n")}));
 }
 
-TEST(AndroidManifestDocument, OneThatTurnsBadAfterTheManifestTagKeepsWhatWasFound) {
+TEST(AndroidManifestDocument, OneThatTurnsBadAfterTheManifestTagKeepsTheName) {
   EXPECT_EQ(Read(CompiledXml()
                      .Start("manifest", {Package("found")})
                      .BadNode()
@@ -352,7 +352,7 @@ TEST(AndroidManifestDocument, OneThatTurnsBadAfterThePermissionKeepsIt) {
             (Facts{"", true}));
 }
 
-// The document's first `length` bytes, with the outer length made to fit.
+// The document's first `length` bytes, with its outer length adapted.
 Bytes CutTo(size_t length, const Bytes& document) {
   Bytes cut(document.begin(), document.begin() + static_cast<ptrdiff_t>(length));
   for (size_t i = 4; i < 8 && i < length; ++i) {
@@ -377,7 +377,7 @@ TEST(AndroidManifestDocument, OneThatIsCutShortAnywhereIsReadOrRefusedWithoutHar
   EXPECT_LT(read, whole.size());
 }
 
-// Replaces the one place where the document has these bytes.
+// Replaces these bytes, which the document has in one place only.
 Bytes Replaced(Bytes document, const Bytes& old_bytes, const Bytes& new_bytes) {
   const auto at = std::search(document.begin(), document.end(), old_bytes.begin(), old_bytes.end());
   EXPECT_NE(at, document.end());
@@ -385,7 +385,7 @@ Bytes Replaced(Bytes document, const Bytes& old_bytes, const Bytes& new_bytes) {
   return document;
 }
 
-// The platform's library then has no text for it, and yet a length.
+// The platform's library then returns no text for the name, but a length.
 TEST(AndroidManifestDocument, AnElementWhoseNameDoesNotEndIsPassedOver) {
   CompiledXml xml;
   xml.Element("manifest", {Package("a")}).Element("permission", {AndroidName(kPermission)});

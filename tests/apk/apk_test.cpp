@@ -1,4 +1,4 @@
-// Init: the flags that say how far it got, and the road of a package step by step.
+// Init: the flags that say how far it got, and the steps that verify a package.
 #include "apk/apk.h"
 
 #include <fcntl.h>
@@ -19,7 +19,7 @@ namespace {
 
 constexpr int32_t kInvalidHandle = -4;
 
-// The flags, and whether there is an open archive, in one comparable value.
+// The flags, and whether an archive is open, in one value that can be compared.
 struct State {
   bool good_zip, apk, good_apk, open;
 };
@@ -30,7 +30,7 @@ std::ostream& operator<<(std::ostream& out, const State& state) {
   return out << state.good_zip << state.apk << state.good_apk << state.open;
 }
 
-// The package must hold no "classes.dex" for IsGoodApk to be the verdict of Init alone.
+// The package must not have "classes.dex": IsGoodApk is then the verdict of Init alone.
 State StateOf(Apk& apk) {
   void* cookie = nullptr;
   const int32_t result = apk.StartIteration(&cookie, "", "");
@@ -39,14 +39,14 @@ State StateOf(Apk& apk) {
   return {apk.IsGoodZip(), apk.IsApk(), apk.IsGoodApk(), result == 0};
 }
 
-// The package without a dex file whose manifest is this text.
+// A package without a dex file, with this text as its manifest.
 PackageOptions WithoutDexListedBy(const std::string& text) {
   PackageOptions options = WithoutDex();
   options.edit_manifest = [=](const std::string&) { return text; };
   return options;
 }
 
-// ---- The flags after Init: one test for each row of how far it can get.
+// ---- The flags after Init: one test for each step that it can reach.
 
 TEST(ApkInit, WithoutDescriptorAndPathAllFlagsAreFalse) {
   LogCapture log;
@@ -58,8 +58,8 @@ TEST(ApkInit, WithoutDescriptorAndPathAllFlagsAreFalse) {
   EXPECT_EQ(apk.GetPath(), "");
 }
 
-// No descriptor is asked for by a number below -1 either.
-TEST(ApkInit, ANegativeDescriptorWithoutAPathIsNone) {
+// A number below -1 does not name a descriptor either.
+TEST(ApkInit, ANegativeDescriptorWithoutAPathIsRefused) {
   LogCapture log;
   Apk apk(-1);
   log.Clear();
@@ -165,7 +165,7 @@ TEST(ApkInit, DescriptorZeroFromItsOwnOpenCountsAsAFailure) {
   EXPECT_EQ(StateOf(apk), (State{false, false, false, false}));
 }
 
-TEST(ApkInit, DescriptorOneFromItsOwnOpenIsOneLikeOthers) {
+TEST(ApkInit, DescriptorOneFromItsOwnOpenIsUsed) {
   DiskFile file(MakePackage(WithoutDex()).Build());
   LogCapture log;
   Apk apk(-1);
@@ -179,7 +179,7 @@ TEST(ApkInit, DescriptorOneFromItsOwnOpenIsOneLikeOthers) {
   EXPECT_TRUE(apk.IsGoodZip());
 }
 
-// Whoever gives it knows what it is.
+// The caller knows what descriptor 0 is if it passes descriptor 0.
 TEST(ApkInit, DescriptorZeroThatWasGivenIsUsed) {
   DiskFile file(MakePackage(WithoutDex()).Build());
   LogCapture log;
@@ -208,7 +208,7 @@ TEST(ApkInit, AnyOtherNegativeDescriptorIsUsedUnchangedWhenThereIsAPath) {
 
 TEST(ApkInit, TheCallersDescriptorStaysOpen) {
   MemoryFile file(MakePackage(WithoutDex()).Build());
-  static_cast<void>(Apk(file.fd()));  // made, and gone again
+  static_cast<void>(Apk(file.fd()));  // constructed and destroyed
   EXPECT_NE(fcntl(file.fd(), F_GETFD), -1);
 }
 
@@ -259,7 +259,7 @@ TEST(ApkInit, ASecondInitForgetsTheFirstOnesDigests) {
   EXPECT_FALSE(open.apk.VerifyFileHash("lib/only.so", disk.path()));
 }
 
-// The road of the second package ends where its manifest has been loaded already.
+// Verification of the second package ends after its manifest has been loaded.
 TEST(ApkInit, ASecondInitThatFailsAfterLoadingItsManifestHasNoDigests) {
   PackageOptions first = WithoutDex();
   first.entries.push_back({"lib/only.so", ToBytes("only")});
@@ -281,9 +281,9 @@ TEST(ApkInit, ASecondInitThatFailsAfterLoadingItsManifestHasNoDigests) {
   }
 }
 
-// ---- The road of a package, step by step.
+// ---- The verification of a package, step by step.
 
-TEST(ApkInit, APackageWithoutManifestIsNotGoodAndSaysNothing) {
+TEST(ApkInit, APackageWithoutManifestIsNotGoodAndLogsNothing) {
   Package package = MakePackage(WithoutDex());
   package.Remove(kManifestName);
   LogCapture log;
@@ -292,8 +292,8 @@ TEST(ApkInit, APackageWithoutManifestIsNotGoodAndSaysNothing) {
   EXPECT_EQ(StateOf(open.apk), (State{true, true, false, true}));
 }
 
-// The manifest is asked for before the signature file and its block, of which nothing is said then.
-TEST(ApkInit, APackageWithoutManifestAndBlockSaysNothingOfEither) {
+// The manifest is read before the signature file and its block. Nothing is logged about these then.
+TEST(ApkInit, APackageWithoutManifestAndBlockLogsNothing) {
   Package package = MakePackage(WithoutDex());
   package.Remove(kManifestName);
   package.Remove("META-INF/CERT.RSA");
@@ -353,7 +353,7 @@ TEST(ApkInit, AnAndroidManifestThatIsNotCompiledXmlIsReported) {
   EXPECT_EQ(StateOf(open.apk), (State{true, true, false, true}));
 }
 
-// What the Android manifest says is not looked at before the manifest has been loaded.
+// The Android manifest is read only after the manifest has been loaded.
 TEST(ApkInit, AnAndroidManifestIsReadOnlyAfterTheManifestWasLoaded) {
   PackageOptions options = WithoutDexListedBy("Key:x");
   options.secure_storage = true;
@@ -380,7 +380,7 @@ TEST(ApkInit, AManifestWithoutSectionsMakesAGoodPackage) {
 
 // ---- The digests that the manifest records.
 
-// The package whose manifest has this one section, or these two.
+// A package whose manifest has these one or two sections.
 PackageOptions WithSections(const JarText& sections) {
   return WithoutDexListedBy(JarText::Manifest().EndSection().text() + sections.text());
 }

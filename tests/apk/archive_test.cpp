@@ -1,4 +1,4 @@
-// Finding and extracting entries, also those that are not what they say, and walking through all.
+// Finding and extracting entries, also entries that lie about themselves, and walking through all.
 #include <gtest/gtest.h>
 
 #include <algorithm>
@@ -64,9 +64,9 @@ TEST(ApkIteration, AFilterThatNoNameCanHaveIsAnInvalidName) {
   EXPECT_EQ(open.apk.StartIteration(&cookie, "", std::string(0x10000, 'a')), kInvalidEntryName);
 }
 
-// ---- Entries that are not what they say.
+// ---- Entries that lie about themselves.
 
-// The package with its Android manifest as given.
+// The log for a package with this Android manifest.
 std::string LogOfAndroidManifest(const ZipItem& item) {
   Package package = MakePackage(WithoutDex());
   package.Item(kAndroidManifestName) = item;

@@ -10,7 +10,8 @@
 
 namespace {
 
-// What base64decode() makes of `text` with `room` bytes to write to; memory ends behind both.
+// The result of base64decode() for `text` and `room` bytes of output. Memory ends behind both
+// buffers.
 struct Decoded {
   int result;
   size_t length;
@@ -80,7 +81,7 @@ TEST(Base64Decode, NulIsSkipped) {
   EXPECT_EQ(ToBytes("ABC"), Base64Decode(std::string("Q\0UJ\0D\0", 7)));
 }
 
-TEST(Base64Decode, WhatFollowsTheFirstEqualsSignIsIgnored) {
+TEST(Base64Decode, TextAfterTheFirstEqualsSignIsIgnored) {
   EXPECT_EQ(ToBytes("A"), Base64Decode("QQ=UJD\x01 \xFF"));
   EXPECT_EQ(ToBytes(""), Base64Decode("=QUJD"));
 }
@@ -91,7 +92,8 @@ TEST(Base64Decode, SpaceMakesItEmpty) {
   EXPECT_EQ(Bytes(), Base64Decode("QUJD "));
 }
 
-// Every byte alone behind a whole group: skipped, the end, a left-over value, or refused.
+// Each byte, alone after a whole group, is skipped, ends the text, is a left-over value, or is
+// refused.
 TEST(Base64Decode, EveryByteOutsideTheAlphabetIsRefused) {
   const std::string accepted =
       "ABCDEFGHIJKLMNOPQRSTUVWXYZabcdefghijklmnopqrstuvwxyz0123456789+/=\r\n" + std::string(1, 0);
@@ -104,7 +106,7 @@ TEST(Base64Decode, EveryByteOutsideTheAlphabetIsRefused) {
   }
 }
 
-// The alphabet in its order: values 0, 1, 2, 3 are 000000 000001 000010 000011, and so on.
+// The alphabet in order: values 0, 1, 2, 3 are 000000 000001 000010 000011, and so on.
 TEST(Base64Decode, TheAlphabetCountsFromZeroToSixtyThree) {
   Bytes expected;
   for (int value = 0; value < 64; value += 4) {
@@ -125,7 +127,7 @@ TEST(Base64Decode, LowBitsThatBelongToNoByteAreIgnored) {
   EXPECT_EQ(ToBytes("AB"), Base64Decode("QUJ="));
 }
 
-TEST(Base64Decode, ErrorGivesNothingOfWhatWasDecodedBefore) {
+TEST(Base64Decode, ErrorDropsTheBytesDecodedBefore) {
   EXPECT_EQ(Bytes(), Base64Decode("QUJDREVG!"));
 }
 
@@ -140,22 +142,22 @@ TEST(Base64DecodeToBuffer, RoomThatIsJustEnoughIsEnough) {
   EXPECT_EQ((Decoded{0, 4, ToBytes("ABCD")}), Decode("QUJDRA==", 4));
 }
 
-TEST(Base64DecodeToBuffer, RoomExceededByAWholeGroup) {
+TEST(Base64DecodeToBuffer, AWholeGroupBeyondTheRoomIsRefused) {
   EXPECT_EQ((Decoded{1, 2, {kUntouched, kUntouched}}), Decode("QUJD", 2));
   EXPECT_EQ((Decoded{1, 5, {'A', 'B', 'C', kUntouched, kUntouched}}), Decode("QUJDREVG", 5));
 }
 
-TEST(Base64DecodeToBuffer, RoomExceededByTwoBytesLeftOver) {
+TEST(Base64DecodeToBuffer, TwoLeftOverBytesBeyondTheRoomAreRefused) {
   EXPECT_EQ((Decoded{1, 1, {kUntouched}}), Decode("QUI=", 1));
   EXPECT_EQ((Decoded{1, 4, {'A', 'B', 'C', kUntouched}}), Decode("QUJDREU", 4));
 }
 
-TEST(Base64DecodeToBuffer, RoomExceededByOneByteLeftOver) {
+TEST(Base64DecodeToBuffer, OneLeftOverByteBeyondTheRoomIsRefused) {
   EXPECT_EQ((Decoded{1, 0, {}}), Decode("QQ==", 0));
   EXPECT_EQ((Decoded{1, 3, ToBytes("ABC")}), Decode("QUJDRA", 3));
 }
 
-TEST(Base64DecodeToBuffer, NothingNeedsNoBuffers) {
+TEST(Base64DecodeToBuffer, EmptyTextNeedsNoBuffers) {
   size_t length = 0;
   EXPECT_EQ(0, base64decode(nullptr, 0, nullptr, &length));
   EXPECT_EQ(0U, length);

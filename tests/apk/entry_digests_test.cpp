@@ -19,7 +19,7 @@ std::string Found(const EntryDigests& digests, const std::string& name) {
   return "none";
 }
 
-// What a manifest of these sections records.
+// The digests of a manifest with these sections.
 class Recorded {
  public:
   explicit Recorded(const std::string& sections) {
@@ -75,7 +75,7 @@ TEST(EntryDigests, OfEqualNamesTheLaterSectionCountsInAnyOrder) {
   EXPECT_EQ("SHA-256-Digest 3", unordered.Of("b"));
 }
 
-// More of them than any sort that is stable for few keeps in order.
+// There are too many equal names for a sort that is stable only for a few.
 TEST(EntryDigests, OfManyEqualNamesTheLastSectionCounts) {
   std::string sections = Section("z", "0");
   for (int i = 1; i <= 100; ++i) sections += Section(i % 2 == 0 ? "a" : "b", std::to_string(i));
@@ -85,17 +85,18 @@ TEST(EntryDigests, OfManyEqualNamesTheLastSectionCounts) {
   EXPECT_EQ("SHA-256-Digest 0", recorded.Of("z"));
 }
 
-// The hash of a name turns by 9 bits before each letter. After 64 letters it is where it was, and
-// so names that have the same letters there share a hash, in whatever order these are.
+// The hash of a name turns by 9 bits before each letter. After 64 letters it has turned round once.
+// Names with the same letters, 64 letters apart, therefore share a hash in any order of these
+// letters.
 std::string With64Between(const std::string& letters) {
   std::string name;
   for (const char letter : letters) name += letter + std::string(63, '/');
   return name;
 }
 
-// Which of the names share one: all, some, those next to one another. A byte that seven others
-// follow was rotated by 63 bits to the left, so an even one by one to the right. "b" and "q" make
-// 0x31 ^ 0x71, "d" and "r" 0x32 ^ 0x72, both 0x40.
+// All names share a hash, or some do, or neighbours do. A byte that seven others follow was rotated
+// by 63 bits to the left, so an even byte was rotated by one to the right. "b" and "q" make 0x31 ^
+// 0x71, "d" and "r" 0x32 ^ 0x72, both 0x40.
 TEST(EntryDigests, NamesThatShareAHashAreToldApart) {
   const std::vector<std::string> families[] = {
       {With64Between("abc"), With64Between("acb"), With64Between("bac"), With64Between("bca"),
@@ -160,7 +161,7 @@ TEST(EntryDigests, NamesOfAttributesAreCaseSensitive) {
   EXPECT_EQ("none", recorded.Of("d"));
 }
 
-TEST(EntryDigests, NothingIsListedBeforeItIsAskedFor) {
+TEST(EntryDigests, NothingIsListedBeforeListIsCalled) {
   const std::string text = Section("a", "1");
   EntryDigests digests;
   EXPECT_TRUE(digests.Load({text.begin(), text.end()}));
@@ -170,8 +171,8 @@ TEST(EntryDigests, NothingIsListedBeforeItIsAskedFor) {
   EXPECT_TRUE(digests.Find("a", digest_name, digest));
 }
 
-// Whether it parses or not: nothing is left of the one before.
-TEST(EntryDigests, LoadingAnotherManifestForgetsTheFirstOnes) {
+// Nothing is left of the first manifest, even if the second one does not parse.
+TEST(EntryDigests, LoadingAnotherManifestForgetsTheFirst) {
   LogCapture log;
   for (const std::string& other : {Section("b", "2"), std::string("Key:x")}) {
     const std::string text = Section("a", "1");
@@ -187,7 +188,7 @@ TEST(EntryDigests, LoadingAnotherManifestForgetsTheFirstOnes) {
   }
 }
 
-// The same of manifests of all shapes, with names in order and not, each after each.
+// The same with manifests of all shapes, with sorted and unsorted names, each after each.
 TEST(EntryDigests, NothingOfAnEarlierManifestSurvives) {
   const std::string manifests[] = {
       "",
@@ -214,7 +215,7 @@ TEST(EntryDigests, NothingOfAnEarlierManifestSurvives) {
   }
 }
 
-// What follows the text in memory, and what the table held there before, would do for one more.
+// The bytes after the text, and the table's former contents, would make one more section.
 TEST(EntryDigests, NoMoreSectionsAreListedThanThereAre) {
   const std::string two = Section("a", "1") + Section("b", "2");
   const std::string whole = two + Section("c", "3");
@@ -228,7 +229,7 @@ TEST(EntryDigests, NoMoreSectionsAreListedThanThereAre) {
   EXPECT_EQ("none", Found(digests, "c"));
 }
 
-TEST(EntryDigests, WhatIsFoundReplacesWhatTheTextsHeld) {
+TEST(EntryDigests, AFoundDigestReplacesBothTexts) {
   const std::string text = Section("a", "1");
   EntryDigests digests;
   ASSERT_TRUE(digests.Load({text.begin(), text.end()}));

@@ -1,4 +1,4 @@
-// Single entries and files against the digests that the manifest records.
+// Comparing single entries and files with the digests that the manifest records.
 #include <gtest/gtest.h>
 #include <sys/stat.h>
 #include <unistd.h>
@@ -13,7 +13,7 @@
 
 using ApkTools::Apk;
 
-// The linker sends the tool's calls of read here, those of a build with _FORTIFY_SOURCE included.
+// The linker sends the tool's calls of read here, also those of a build with _FORTIFY_SOURCE.
 static std::function<void()> before_read;
 
 extern "C" ssize_t __real_read(int fd, void* buffer, size_t size);
@@ -87,7 +87,7 @@ TEST(IsGoodApk, OtherEntriesAreNotExamined) {
   EXPECT_TRUE(open.apk.IsGoodApk());
 }
 
-// Changes the data of "classes.dex" in the file under an open package.
+// Changes the data of "classes.dex" in the file of an open package.
 void ChangeDex(OpenPackage& open, const Bytes& archive) {
   const Bytes dex = ToBytes("dex\n035");
   const auto found = std::search(archive.begin(), archive.end(), dex.begin(), dex.end());
@@ -129,7 +129,7 @@ TEST(IsGoodApk, ADexThatIsThereButCannotBeFoundIsBad) {
   EXPECT_EQ(log.records(), Records({Error(kDexFailed)}));
 }
 
-// The package is good but for the length that its "classes.dex" then claims.
+// The package is good except for the length that its "classes.dex" then claims.
 void ExpectImpossibleLengthToBeBad(Package package) {
   ASSERT_TRUE(OpenPackage(package).apk.IsGoodApk());
   ZipItem& dex = package.Item("classes.dex");
@@ -143,7 +143,7 @@ void ExpectImpossibleLengthToBeBad(Package package) {
 
 TEST(IsGoodApk, ADexOfAnImpossibleLengthIsBad) { ExpectImpossibleLengthToBeBad(MakePackage()); }
 
-// What cannot be extracted is not what the manifest lists, though that be nothing at all.
+// An entry that cannot be extracted does not match, even if the manifest lists it as empty.
 TEST(IsGoodApk, ADexOfAnImpossibleLengthThatIsListedAsEmptyIsBad) {
   PackageOptions options;
   options.entries = {{"classes.dex", {}}};
@@ -161,7 +161,7 @@ TEST(IsGoodApk, OtherDexFilesAreNotExamined) {
 
 // ---- One entry.
 
-// VerifyEntryHash on the entry that the archive has under this name.
+// Calls VerifyEntryHash for the archive's entry of this name.
 bool VerifyEntry(OpenPackage& open, const std::string& name) {
   void* cookie;
   EXPECT_EQ(open.apk.StartIteration(&cookie, name, name), 0);
@@ -183,7 +183,7 @@ TEST(VerifyEntryHash, AnEntryListedWithSha1AloneIsVerifiedWithIt) {
   EXPECT_TRUE(VerifyEntry(open, "classes.dex"));
 }
 
-// "classes.dex" listed with the digests of these contents.
+// "classes.dex", listed with the digests of these contents.
 PackageOptions WithDexDigests(const std::string& sha1_of, const std::string& sha256_of) {
   return WithManifest(JarText::Manifest()
                           .EndSection()
@@ -292,8 +292,8 @@ TEST(VerifyFileHash, AFileThatCannotBeReadIsReported) {
   EXPECT_EQ(log.records(), Records({Error("Can't open file: /nowhere/libfoo.so\n")}));
 }
 
-// The digest is decoded first, and whether it can be makes no difference to what is read.
-TEST(VerifyFileHash, AFileThatCannotBeReadIsReportedWhateverItsDigest) {
+// The digest is decoded first. The file is read even if the digest cannot be decoded.
+TEST(VerifyFileHash, AFileThatCannotBeReadIsReportedWithAnyDigest) {
   for (const char* digest : {"not base64!", "====", "AAAA"}) {
     OpenPackage open(WithManifest(JarText::Manifest()
                                       .EndSection()
@@ -311,7 +311,7 @@ TEST(VerifyFileHash, AFileThatCannotBeReadIsReportedWhateverItsDigest) {
   }
 }
 
-// What is cut off counts as zeros, whatever the file before it held there.
+// The missing bytes count as zeros, even if the buffer held another file's bytes there.
 TEST(VerifyFileHash, AFileThatShrinksMeanwhileEndsInZeros) {
   PackageOptions options;
   options.entries = {{"first", ToBytes("the first file")},

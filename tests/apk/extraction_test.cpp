@@ -1,4 +1,4 @@
-// What is believed of an entry's lengths before memory is made for it.
+// Checking an entry's lengths before memory is allocated for it.
 #include "apk/extraction.h"
 
 #include <gtest/gtest.h>
@@ -10,8 +10,8 @@
 
 using namespace ApkTools;
 
-// The linker sends the tool's calls of mmap here, and with them its question whether there is
-// memory to be had.
+// The linker sends the tool's calls of mmap here, also the one by which it asks if memory can be
+// had.
 static bool memory_is_short = false;
 
 extern "C" void* __real_mmap(void* address, size_t size, int protection, int flags, int fd,
@@ -26,7 +26,7 @@ extern "C" void* __wrap_mmap(void* address, size_t size, int protection, int fla
 
 namespace {
 
-TEST(Extraction, AnEntryReplacesWhatTheVectorHeld) {
+TEST(Extraction, AnEntryReplacesTheVectorsContents) {
   OpenEntry zip({"a", ToBytes("abc"), true});
   Bytes out(100, 1);
   EXPECT_EQ(ExtractZipEntry(zip.handle, &zip.entry, out), 0);
@@ -42,8 +42,8 @@ TEST(Extraction, AnEmptyEntryIsExtracted) {
   }
 }
 
-// 258 bytes for every two bits: nothing that deflates is closer to the limit than zeros.
-TEST(Extraction, WhatDeflatesBestIsPlausible) {
+// 258 bytes for every two bits: zeros come closest to deflate's limit.
+TEST(Extraction, TheBestDeflatedDataIsPlausible) {
   const Bytes zeros(10 << 20, 0);
   OpenEntry zip({"a", zeros, true});
   EXPECT_GT(zeros.size(), 1020 * Deflate(zeros).size());
@@ -83,7 +83,7 @@ TEST(Extraction, AStoredEntryIsAsLongAsItsData) {
   EXPECT_TRUE(IsPlausibleLength(entry));
 }
 
-// An entry of zeros whose length is more than is believed; made once, for it takes its time.
+// An entry of zeros longer than the trusted length. It is made once, because that takes time.
 constexpr uint32_t kLongLength = kZipTrustedLength + 2;
 const ZipItem& LongItem() {
   static const ZipItem item = [] {

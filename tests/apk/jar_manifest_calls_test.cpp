@@ -1,6 +1,5 @@
-// What the readers of a JAR's manifest ask of the C and the C++ library, where their results do not
-// tell: how often they compare, and how they copy. The linker sends the calls of the whole program
-// here.
+// Counts calls of the C and the C++ library by the readers of a JAR's manifest: comparisons and
+// copies, which results do not show. The linker sends the calls of the whole program here.
 #include <gtest/gtest.h>
 
 #include <algorithm>
@@ -17,7 +16,7 @@
 namespace {
 
 size_t comparisons = 0;
-// Copies begin at the last byte, as memcpy may, whose pieces do not overlap.
+// Copies begin at the last byte. memcpy may do so, because its pieces do not overlap.
 bool copies_backwards = false;
 
 }  // namespace
@@ -31,7 +30,7 @@ int __wrap_memcmp(const void* a, const void* b, size_t size) {
   return __real_memcmp(a, b, size);
 }
 
-// What compilers make of a memcmp that is asked for no more than equality.
+// Compilers turn a memcmp into this call if only equality matters.
 int __wrap_bcmp(const void* a, const void* b, size_t size) { return __wrap_memcmp(a, b, size); }
 
 void* __wrap_memcpy(void* to, const void* from, size_t size) {
@@ -49,7 +48,7 @@ class JarManifestCalls : public testing::Test {
   ~JarManifestCalls() override { copies_backwards = false; }
 };
 
-// How often the text, of one section, has the names of its attributes compared.
+// The number of comparisons of attribute names for a text of one section.
 size_t ComparisonsOf(const std::vector<std::string>& names) {
   std::string text;
   for (const std::string& name : names) text += name + ": 1\r\n";
@@ -60,15 +59,15 @@ size_t ComparisonsOf(const std::vector<std::string>& names) {
   return comparisons;
 }
 
-// Distinct names of five bytes.
+// Different names of five bytes.
 std::vector<std::string> ShortNames(size_t count) {
   std::vector<std::string> names;
   for (size_t i = 0; i < count; ++i) names.push_back(std::to_string(10000 + i));
   return names;
 }
 
-// A sort compares each name with about log2(count) others. To do it again when so much has been
-// added that it pays takes no more than twice as many comparisons in all, and twice is allowed.
+// A sort compares each name with about log2(count) others. Sorting again only after enough new
+// names at most doubles the comparisons. This test allows twice as many.
 TEST_F(JarManifestCalls, DistinctShortNamesAreSortedInLogarithmicTime) {
   std::vector<std::string> names = ShortNames(4096);
   std::shuffle(names.begin(), names.end(), std::mt19937(1));
@@ -83,7 +82,7 @@ TEST_F(JarManifestCalls, NamesInOrderAreComparedWithTheirNeighboursAlone) {
   EXPECT_LT(count, 4 * 4096u);
 }
 
-// Few names again and again: each time that as much has been read as they take.
+// A few names that repeat are sorted each time after as much text as they take.
 TEST_F(JarManifestCalls, NamesThatRepeatAreComparedInLogarithmicTime) {
   std::vector<std::string> names;
   for (int round = 0; round < 64; ++round) {
@@ -92,7 +91,7 @@ TEST_F(JarManifestCalls, NamesThatRepeatAreComparedInLogarithmicTime) {
   EXPECT_LT(ComparisonsOf(names), 4 * 12u * 4096);
 }
 
-// Whatever the text before it was like.
+// The text before it does not matter.
 TEST_F(JarManifestCalls, ATableThatWasResetSortsAsOftenAsAFreshOne) {
   std::string text(100000, 'a');
   text[90001] = 'b';  // the last name by its place and by its order
@@ -116,7 +115,7 @@ TEST_F(JarManifestCalls, ATableThatWasResetSortsAsOftenAsAFreshOne) {
 
 // ---- Looking up a name.
 
-// How often the name in the middle is compared when it is looked up.
+// The number of comparisons for looking up the name in the middle.
 size_t ComparisonsOfFinding(const std::vector<std::string>& names) {
   std::string text;
   for (const std::string& name : names) text += "Name: " + name + "\r\nSHA1-Digest: 1\r\n\r\n";
@@ -129,8 +128,8 @@ size_t ComparisonsOfFinding(const std::vector<std::string>& names) {
   return comparisons;
 }
 
-// A comparison of two names takes some more, of the names of attributes. Names in order are
-// compared with about log2(4096) others, and those in no order with the one of the same hash.
+// Comparing two entry names also compares a few attribute names. Sorted names are compared with
+// about log2(4096) others, unsorted names with the one of the same hash.
 TEST_F(JarManifestCalls, NamesInOrderAreNotHashed) {
   std::vector<std::string> names = ShortNames(4096);
   const size_t in_order = ComparisonsOfFinding(names);
@@ -139,7 +138,7 @@ TEST_F(JarManifestCalls, NamesInOrderAreNotHashed) {
   EXPECT_GT(in_order, 12u);
 }
 
-// ---- Continuation lines, which move up over what lies before them.
+// ---- Continuation lines, which move up to the line before them.
 
 TEST_F(JarManifestCalls, LinesThatOverlapTheirNewPlaceAreMovedWhole) {
   std::string value;

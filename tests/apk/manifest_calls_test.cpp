@@ -1,5 +1,5 @@
-// How often the platform's library is asked for the same, where its answers do not tell. The linker
-// sends the calls of the tool here (CMakeLists.txt names them as the compiler does) and they go on
+// Counts calls of the platform's library, because its answers do not show how often it is asked.
+// The linker sends the tool's calls here (CMakeLists.txt has the compiler's names), and they go on
 // to the library. A hostile document makes each call cost as much as it can.
 #include <androidfw/ResourceTypes.h>
 #include <gtest/gtest.h>
@@ -11,7 +11,7 @@
 
 namespace {
 
-int attribute_names = 0;  // asked for
+int attribute_names = 0;  // requested
 int conversions = 0;      // to UTF-8
 
 }  // namespace
@@ -79,7 +79,7 @@ TEST_F(ManifestCalls, AttributeOfNoSizeIsReadWhenItIsAskedFor) {
   EXPECT_EQ(attribute_names, 1);
 }
 
-TEST_F(ManifestCalls, NoAttributesAreNone) {
+TEST_F(ManifestCalls, NoAttributesAreRead) {
   Read(CompiledXml()
            .StartWithSizelessAttributes("manifest", StringAttribute("package", "p"), 0)
            .End("manifest"));
@@ -87,7 +87,7 @@ TEST_F(ManifestCalls, NoAttributesAreNone) {
   EXPECT_EQ(attribute_names, 0);
 }
 
-// Each text is looked through once, however many elements have it for the package's name.
+// Each text is converted once, even if many elements have it as the package's name.
 TEST_F(ManifestCalls, TextThatConvertsToNoNameIsConvertedOnce) {
   CompiledXml xml(CompiledXml::Pool::kUtf16);
   for (int i = 0; i < 5; ++i) {

@@ -17,8 +17,8 @@ namespace {
 using Section = std::map<std::string, std::string>;
 using Sections = std::vector<Section>;
 
-// Copies of the sections, in whose maps an attribute out of order would be put right: they are seen
-// to be in order first.
+// Copies the sections into maps. The attributes must be in order before that, because a map would
+// hide a wrong order.
 Sections SectionsOf(const ManifestMf& manifest) {
   Sections sections;
   for (const ManifestMf::Section& section : manifest.getSections()) {
@@ -35,7 +35,7 @@ std::string Text(const char (&literal)[n]) {
   return std::string(literal, n - 1);
 }
 
-// The sections of `text`, which parses without a message.
+// The sections of `text`, which must parse without a message.
 Sections Parse(const std::string& text) {
   LogCapture log;
   ManifestMf manifest;
@@ -45,7 +45,7 @@ Sections Parse(const std::string& text) {
   return SectionsOf(manifest);
 }
 
-// `text` does not parse, `message` says why, and `sections` ended before the fault.
+// `text` must not parse; `message` is logged, and `sections` ended before the fault.
 void ExpectFault(const std::string& text, const std::string& message,
                  const Sections& sections = {}) {
   LogCapture log;
@@ -82,8 +82,8 @@ TEST(ManifestMf, LoadStartsFromScratch) {
   EXPECT_EQ(Sections({{{"A", "1"}}}), SectionsOf(manifest));
 }
 
-// Texts of different shapes, some of which do not parse, each after each: what one leaves behind
-// would not read right in the other.
+// Loads texts of different shapes, some of which do not parse, each after each. Leftovers of one
+// would show in the result of the other.
 TEST(ManifestMf, NothingOfAnEarlierTextSurvives) {
   std::string many = "Longer-Name: longer value\r\n\r\n";
   for (int i = 0; i < 50; ++i) many += "B" + std::to_string(i) + ": 1\r\nC: 2\r\n\r\n";
@@ -107,7 +107,7 @@ TEST(ManifestMf, NothingOfAnEarlierTextSurvives) {
   }
 }
 
-// The memory of the text goes on behind it, with bytes that would mean something.
+// The memory after the text holds bytes that would change the result.
 TEST(ManifestMf, NothingBehindTheTextIsRead) {
   LogCapture log;
   const std::string whole = "Name: abcdefghijklm\r\n nopq\r\nKey: 1\r\n\r\nB:\r\n\r\n";
@@ -176,8 +176,8 @@ TEST(ManifestMf, SeveralLinesContinueAValue) {
             Parse("A: one\r\n two\r\n  three\r\n \r\nB: 2\r\n\r\n"));
 }
 
-// The value is one piece of the text that the manifest owns, right behind its name and ": ".
-TEST(ManifestMf, ContinuationLinesMoveUpBehindWhatTheyContinue) {
+// The value is one piece of the manifest's own text, right after its name and ": ".
+TEST(ManifestMf, ContinuationLinesMoveUpToTheirValue) {
   ManifestMf manifest;
   EXPECT_TRUE(manifest.load(std::string("A: 1\r\n 23\n 45\r\n\r\n")));
   ASSERT_EQ(1u, manifest.getSections().size());
@@ -223,7 +223,7 @@ TEST(ManifestMf, AnyOtherByteAfterAColonFails) {
               "Parse manifest: Error: P_COLON: unexpected 0x09 after colon: \t\n");
 }
 
-// The record ends where the NUL that stands for the missing byte is printed.
+// The record ends at the NUL that is printed for the missing byte.
 TEST(ManifestMf, ColonAtTheEndOfTheTextFails) {
   ExpectFault("Key:", "Parse manifest: Error: P_COLON: unexpected 0x00 after colon: ");
 }
@@ -242,7 +242,7 @@ TEST(ManifestMf, NameThatRunsIntoTheEndOfTheTextFails) {
   ExpectNoColon("A: 1\r\nNoColonHere\r\n", "NoColonHere\r\n");
 }
 
-// Whole, or as much of it as the log takes: 1024 bytes with a NUL at the end.
+// The whole name, or the part that the log takes: 1024 bytes with a NUL at the end.
 TEST(ManifestMf, NameThatRunsIntoTheEndOfTheTextIsToldAtAnyLength) {
   const std::string before = "Parse manifest: Error: P_KEY: unexpected end of file after key '";
   std::string name;
@@ -319,7 +319,7 @@ TEST(ManifestMf, ContinuationAfterAColonAndALoneLineFeedIsAName) {
   EXPECT_EQ(Sections({{{"value\nName", "x"}}}), Parse("A:\n value\nName: x\n\n"));
 }
 
-// The first byte of the next line and a CR or LF behind it are one line break together.
+// The first byte of the next line and a CR or LF after it together are one line break.
 TEST(ManifestMf, OneByteLineAfterAColonAndALoneLineFeedIsLostWithItsLineBreak) {
   EXPECT_EQ(Sections({{{"Name", "x"}}}), Parse("A:\nN\nName: x\n\n"));
 }
@@ -338,7 +338,7 @@ TEST(ManifestMf, EveryKindOfLineBreakEndsLinesAndSections) {
   }
 }
 
-// Wherever in a line of whatever length a byte stands, it ends the line or it does not.
+// At every position in lines of every length, a byte either ends the line or it does not.
 TEST(ManifestMf, OnlyCrLfAndNulEndALine) {
   for (size_t length = 1; length <= 24; ++length) {
     for (size_t at = 0; at < length; ++at) {
@@ -378,7 +378,7 @@ TEST(ManifestMf, NulInAValueIsALineBreak) {
   EXPECT_EQ(Sections({{{"A", "12"}}}), Parse(Text("A: 1\0 2\r\n\r\n")));
 }
 
-// NUL CR and NUL LF are one line break, as CR LF is; the second of two NULs starts a name.
+// NUL CR and NUL LF are one line break, like CR LF; the second of two NULs starts a name.
 TEST(ManifestMf, NulAndTheLineBreakByteBehindItAreOneLineBreak) {
   EXPECT_EQ(Sections({{{"A", "1"}, {"B", "2"}}}), Parse(Text("A: 1\0\nB: 2\r\n\r\n")));
   EXPECT_EQ(Sections({{{"A", "1"}}, {{"B", "2"}}}), Parse(Text("A: 1\0\r\nB: 2\r\n\r\n")));
@@ -390,7 +390,7 @@ TEST(ManifestMf, NulAtTheEndOfTheTextEndsAValueOnly) {
   ExpectNoColon(Text("A: 1\r\n\r\n\0"), "", {{{"A", "1"}}});
 }
 
-// Whatever is cut off, the parser ends, and finds no more sections than in the whole.
+// The parser ends on every prefix, and finds no more sections than in the whole text.
 TEST(ManifestMf, EveryPrefixOfAManifestEnds) {
   LogCapture log;
   const std::string text = "A: 1\r\n 2\r\n\r\nB:\nC: 3\n\nD:\r\n v\r\r";
@@ -404,9 +404,9 @@ TEST(ManifestMf, EveryPrefixOfAManifestEnds) {
   }
 }
 
-// Below, the JDK's parser is asked about manifests as tools write them.
+// The tests below compare with the JDK's parser, on manifests as tools write them.
 
-// A line as the JAR File Specification has it: at most 72 bytes, continued after a space.
+// A line as the JAR File Specification defines it: at most 72 bytes, continued after a space.
 std::string Line(const std::string& name, const std::string& value) {
   std::string line = name + ": " + value;
   std::string text;
@@ -425,7 +425,7 @@ class ManifestWriter {
     std::string text = Line("Manifest-Version", "1.0") + Attributes() + "\r\n";
     const uint32_t sections = Pick(20);
     for (uint32_t i = 0; i < sections; ++i) {
-      // The letters of two bytes are torn apart where a line is continued.
+      // A continuation line splits letters of two bytes.
       const std::string name = "assets/\xC3\xA4\xE2\x82\xAC" + std::to_string(i) + Value();
       text += Line("Name", name) + Attributes() + "\r\n";
     }
@@ -454,7 +454,7 @@ class ManifestWriter {
   std::mt19937 random_;
 };
 
-// What DumpManifest.java would say of `sections`.
+// The output of DumpManifest.java for `sections`.
 std::string Dump(const Sections& sections) {
   std::vector<std::string> entries;
   for (const Section& section : sections) {
@@ -473,10 +473,10 @@ std::string Dump(const Sections& sections) {
 
 TEST(ManifestMf, AgreesWithTheJdkOnWellFormedManifests) {
   constexpr uint32_t kCount = 200;
-  const TempDir folder;
-  const auto path = [&](uint32_t i) { return folder / (std::to_string(i) + ".mf"); };
+  const TempDir directory;
+  const auto path = [&](uint32_t i) { return directory / (std::to_string(i) + ".mf"); };
   for (uint32_t i = 0; i < kCount; ++i) WriteFile(path(i), ToBytes(ManifestWriter(i).Write()));
-  ASSERT_EQ(0, std::system(("java " DUMP_MANIFEST " " + folder.path()).c_str()));
+  ASSERT_EQ(0, std::system(("java " DUMP_MANIFEST " " + directory.path()).c_str()));
   for (uint32_t i = 0; i < kCount; ++i) {
     const std::string expected = ContentOf(path(i) + ".dump");
     EXPECT_EQ(expected, Dump(Parse(ContentOf(path(i))))) << "manifest " << i;

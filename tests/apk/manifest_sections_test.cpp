@@ -1,4 +1,4 @@
-// The table of attributes: looking up, walking, and what repeats.
+// The table of attributes: look-up, iteration, and repeated names.
 #include "apk/manifest_sections.h"
 
 #include <gtest/gtest.h>
@@ -15,10 +15,10 @@ namespace {
 
 using Pairs = std::vector<std::pair<std::string, std::string>>;
 
-// Sections of attributes that the test makes, with the text that they point into.
+// Sections of the test's own attributes, and the text that they point into.
 class Table {
  public:
-  // The text must not move when it grows.
+  // The text must not move as it grows.
   explicit Table(size_t room = 1 << 20) {
     text_.reserve(room);
     sections.reset(reinterpret_cast<const uint8_t*>(text_.data()), 0);
@@ -106,8 +106,8 @@ TEST(ManifestSection, FindsTheLastNameThatEndsSo) {
   EXPECT_EQ(std::make_pair(std::string_view(), std::string_view()), section.findLastEndingIn("-Q"));
 }
 
-// More of them than any sort that is stable for few keeps in order, and in between other sections,
-// so that the table grows in the midst of a section.
+// There are too many equal names for a sort that is stable only for a few. Other sections come
+// between, so that the table grows inside a section.
 TEST(ManifestSection, OfEqualNamesTheLastInTheTextCounts) {
   std::mt19937 random(1);
   Table table(8 << 20);
@@ -128,8 +128,8 @@ TEST(ManifestSection, OfEqualNamesTheLastInTheTextCounts) {
   }
 }
 
-// Names that are few, long and alike, before very many short ones: until as much text has followed,
-// they are not even read.
+// A few long names that are alike come before very many short ones. The long names are not even
+// read until as much text has followed.
 TEST(ManifestSection, LongNamesAreComparedAgainOnlyWhenAsMuchTextHasFollowed) {
   constexpr uint32_t kLength = 1 << 20;
   constexpr size_t kAll = 3 * kLength;

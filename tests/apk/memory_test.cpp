@@ -1,5 +1,5 @@
-// How much memory hostile and large packages make the process take. Each is opened in a process of
-// its own, since the peak of a process never falls.
+// The memory that hostile and large packages cost. Each package is opened in a process of its own,
+// because the peak of a process never falls.
 #include <fcntl.h>
 #include <gtest/gtest.h>
 #include <sys/wait.h>
@@ -18,13 +18,13 @@ namespace {
 
 constexpr long kMegabyte = 1 << 10;  // kilobytes
 
-// What AddressSanitizer keeps of freed memory for a while.
+// The freed memory that AddressSanitizer keeps for a while.
 #ifndef __has_feature
 #define __has_feature(feature) 0
 #endif
 constexpr long kKept = __has_feature(address_sanitizer) ? 256 * kMegabyte : 0;
 
-// The most memory that the process has had, in kilobytes.
+// The peak memory of the process, in kilobytes.
 long PeakMemory() {
   std::ifstream status("/proc/self/status");
   for (std::string word; status >> word;) {
@@ -33,8 +33,7 @@ long PeakMemory() {
   return -1;
 }
 
-// By how much the peak grows with `task`, in kilobytes; -1 when the process dies or `task` answers
-// false.
+// The growth of the peak by `task`, in kilobytes; -1 if the process dies or `task` returns false.
 long PeakGrowth(const std::function<bool()>& task) {
   int ends[2];
   EXPECT_EQ(pipe(ends), 0);
@@ -59,7 +58,7 @@ long GrowthOfOpening(const Bytes& archive) {
   return PeakGrowth([&] { return !OpenPackage(archive).apk.IsApk(); });
 }
 
-constexpr long kLittleMemory = 100 * kMegabyte;  // where the lie is of 4 GB
+constexpr long kLittleMemory = 100 * kMegabyte;  // for a lie of 4 GB
 
 TEST(ApkMemory, GarbageThatDeclaresGigabytesTouchesLittle) {
   ZipItem item{kAndroidManifestName, {}, true};
@@ -78,8 +77,7 @@ TEST(ApkMemory, AFewBytesThatDeclareGigabytesTouchLittle) {
   EXPECT_LT(growth, kLittleMemory);
 }
 
-// By how much the peak grows with a package whose signature file is this text, which compresses
-// well.
+// The growth of the peak by a package whose signature file is this text, which compresses well.
 long GrowthWithSignatureFile(const std::string& text) {
   Package package = MakePackage(WithoutDex());
   ZipItem& signature_file = package.Item("META-INF/CERT.SF");
@@ -95,16 +93,16 @@ std::string Repeat(const std::string& text, size_t count) {
   return whole;
 }
 
-// 40 MB in 40 kB, all of one section that repeats one name: no more than the text and its copy on
-// the way.
+// 40 MB in 40 kB: one section that repeats one name. It costs no more than the text and one copy of
+// it.
 TEST(ApkMemory, NamesThatRepeatTakeNone) {
   const long growth = GrowthWithSignatureFile(Repeat("A: 1\n", 8000000));
   EXPECT_GE(growth, 39 * kMegabyte);
   EXPECT_LT(growth, 60 * kMegabyte + kKept);
 }
 
-// A million sections of one attribute, of 20 bytes each in the table and once more while it grows;
-// what repeats after them takes none all the same.
+// A million sections of one attribute. Each takes 20 bytes in the table, and again while the table
+// grows. Repeated names after them take no memory.
 TEST(ApkMemory, NamesThatRepeatTakeNoneAfterManySections) {
   const std::string sections = Repeat("A: 1\n\n", 1000000);
   const long growth = GrowthWithSignatureFile(sections);
@@ -112,16 +110,16 @@ TEST(ApkMemory, NamesThatRepeatTakeNoneAfterManySections) {
             growth + 30 * kMegabyte + kKept);
 }
 
-// A document whose string pool has UTF-8 strings that lie over one another: each starts with its
-// two lengths, which are text to the strings before it, and all end with the pool's last byte. An
-// element of each name asks the platform's library for a copy of its own in UTF-16.
+// A document whose string pool has overlapping UTF-8 strings. Each starts with its two lengths,
+// which are text to the strings before it, and all end with the pool's last byte. For an element of
+// each name the platform's library makes a separate copy in UTF-16.
 Bytes DocumentOfOverlappingStrings() {
   constexpr uint32_t kText = 16000, kHeader = 28;
   Bytes text(kText, 'a'), offsets, elements;
   uint32_t count = 0;
   for (uint32_t at = 0; at + 4 < kText; at += 4) {
     const uint32_t length = kText - 1 - (at + 4);
-    if ((length & 0xff) == 0 || (length & 0xff) > 0x7f) continue;  // no byte of ASCII
+    if ((length & 0xff) == 0 || (length & 0xff) > 0x7f) continue;  // not ASCII
     for (uint32_t i = 0; i < 4; i += 2) {
       text[at + i] = static_cast<uint8_t>(0x80 | length >> 8);
       text[at + i + 1] = static_cast<uint8_t>(length & 0xff);
@@ -145,21 +143,22 @@ Bytes DocumentOfOverlappingStrings() {
   return Concat({document, pool, offsets, text, elements});
 }
 
-// The library keeps what it converts. The tool cannot tell beforehand what a name will take.
+// The library keeps its conversions. The tool cannot know in advance how much memory a name will
+// take.
 TEST(ApkMemory, OverlappingStringsOfTheAndroidManifestTakeMuchOfThePlatformsMemory) {
   const Bytes document = DocumentOfOverlappingStrings();
   const long growth = PeakGrowth([&] { return ApkTools::Apk(-1).ParseAndroidManifest(document); });
   EXPECT_GT(growth * 1024, 100 * static_cast<long>(document.size()));
 }
 
-// One library at a time, whichever way their sizes go.
+// One library at a time, in rising and in falling order of size.
 TEST(ApkMemory, LibrariesTakeTheLargestOnesSize) {
   PackageOptions options = WithoutDex();
-  TempDir folder;
+  TempDir directory;
   for (const size_t megabytes : {40, 60, 20, 50}) {
     const std::string name = std::to_string(megabytes);
     Bytes content(megabytes << 20, 0);
-    folder.Write(name, content);
+    directory.Write(name, content);
     options.entries.push_back({name, std::move(content), true});
   }
   const Bytes archive = MakePackage(options).Build();
@@ -168,7 +167,7 @@ TEST(ApkMemory, LibrariesTakeTheLargestOnesSize) {
     OpenPackage open(archive);
     bool good = true;
     for (const char* name : {"40", "60", "20", "50"}) {
-      good = open.apk.VerifyFileHash(name, folder / name) && good;
+      good = open.apk.VerifyFileHash(name, directory / name) && good;
     }
     return good;
   });

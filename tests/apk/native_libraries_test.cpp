@@ -1,5 +1,4 @@
-// Where a library lies on disk. That exactly this place is looked at, tests/sign/signing_test.cpp
-// tells.
+// The path of a library on disk. tests/sign/signing_test.cpp tests that exactly this path is read.
 #include "apk/native_libraries.h"
 
 #include <gtest/gtest.h>

@@ -1,4 +1,4 @@
-// A package for whose key there is no memory.
+// A package whose key does not fit in memory.
 #include <gtest/gtest.h>
 
 #include "support/failing_malloc.h"
@@ -7,7 +7,7 @@
 
 namespace {
 
-// The integers are the only part of the tool that asks for memory with malloc.
+// Only the integers allocate with malloc.
 TEST(VerifyCertificate, AKeyThatFindsNoMemoryIsReportedWithItsCode) {
   const Bytes archive = MakePackage().Build();
   LogCapture log;
@@ -19,7 +19,7 @@ TEST(VerifyCertificate, AKeyThatFindsNoMemoryIsReportedWithItsCode) {
                                     Error("file not verified: META-INF/CERT.SF\n")}));
 }
 
-// Each later one fails a verification, of the certificate first and then of the data.
+// Each later failure stops a verification: of the certificate first, and then of the data.
 TEST(VerifyCertificate, AVerificationThatFindsNoMemoryIsReportedWithItsCode) {
   const Bytes archive = MakePackage().Build();
   int certificates = 0, signatures = 0;
@@ -34,8 +34,8 @@ TEST(VerifyCertificate, AVerificationThatFindsNoMemoryIsReportedWithItsCode) {
     ASSERT_EQ(log.records().size(), 2u) << call;
     const bool certificate = log.records()[0] == Error("RSA could not verify certificate: 11\n");
     const bool data = log.records()[0] == Error("RSA could not verify data: 11\n");
-    // The exponent alone may go missing without a word, and then nothing verifies: no padding comes
-    // of a number to the power of 0.
+    // Only the exponent may be missing without an error. Then nothing verifies, because a number to
+    // the power of 0 has no valid padding.
     EXPECT_TRUE(certificate || data ||
                 log.records()[0] == Error("RSA could not verify certificate: 7\n"))
         << call << ": " << log.records()[0];

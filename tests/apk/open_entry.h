@@ -1,4 +1,4 @@
-// The one entry of an archive in memory, as the zip library finds it.
+// The only entry of an archive in memory, as the zip library finds it.
 #pragma once
 
 #include <gtest/gtest.h>

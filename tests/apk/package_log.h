@@ -1,4 +1,4 @@
-// What opening a package logs.
+// The log records of opening a package.
 #pragma once
 
 #include <gtest/gtest.h>

@@ -1,5 +1,5 @@
-// Init on an object that has been used: packages of different shapes, each after each, so that what
-// one leaves behind would not read right in the other (docs/decisions/second-init.md).
+// Init on a used object, with packages of different shapes, each after each. Leftovers of one would
+// show in the facts of the other (docs/decisions/second-init.md).
 #include <gtest/gtest.h>
 
 #include <fcntl.h>
@@ -19,10 +19,10 @@ using ApkTools::Apk;
 
 namespace {
 
-// Entries of whichever package, each with its name for its content.
+// Names of entries of the packages. Each entry has its name as its content.
 constexpr const char* kNames[] = {"a", "b", "c", "lib/long/name/of/an/entry.so", "classes.dex"};
 
-// All that an object tells of its package.
+// All facts of an object about its package.
 struct Facts {
   bool is_good_zip, is_apk, is_good_apk, asks_for_storage;
   std::string path, package_name, verified;
@@ -45,7 +45,7 @@ std::ostream& operator<<(std::ostream& out, const Facts& facts) {
   return out;
 }
 
-// What the object tells after Init with the file.
+// The object's facts after Init with the file.
 Facts AfterInit(Apk& apk, const MemoryFile& file) {
   LogCapture log;
   apk.Init(file.fd(), nullptr);
@@ -67,12 +67,12 @@ PackageOptions WithEntries(const std::vector<std::string>& names) {
   return options;
 }
 
-// Good ones: each has all its facts from its own file.
+// Good packages. The object must have all facts from the package's own file.
 std::vector<PackageOptions> GoodPackages() {
   std::vector<PackageOptions> all;
   // Names in order, and a dex file.
   all.push_back(WithEntries({"a", "b", "classes.dex"}));
-  // Names out of order, SHA-1, a longer key, another name that asks for storage.
+  // Names not in order, SHA-1, a longer key, another name of the storage permission.
   all.push_back(WithEntries({"lib/long/name/of/an/entry.so", "c", "a"}));
   all.back().digests = {"SHA1-Digest"};
   all.back().block.key = "rsa-3072";
@@ -82,7 +82,7 @@ std::vector<PackageOptions> GoodPackages() {
   all.push_back(WithEntries({"c"}));
   all.back().block.key = "rsa-1024";
   all.back().package_name = "";
-  // A manifest that lists nothing, one of a section that is empty, and one of no text.
+  // A manifest that lists nothing, one with an empty section, and one without text.
   for (const char* text : {"Manifest-Version: 1.0\r\n\r\n", "Key:\r\n\r\n", ""}) {
     all.push_back(WithManifest(text));
     all.back().entries.clear();

@@ -54,7 +54,7 @@ TEST(InitCertSf, WithoutASignatureFileItFailsSilently) {
   EXPECT_EQ(log.records(), Records());
 }
 
-TEST(InitCertSf, ASignatureFileInLowerCaseIsNone) {
+TEST(InitCertSf, ASignatureFileInLowerCaseIsIgnored) {
   Package package = MakePackage();
   package.Item("META-INF/CERT.SF").name = "META-INF/cert.sf";
   package.Item("META-INF/CERT.RSA").name = "META-INF/cert.RSA";
@@ -64,7 +64,7 @@ TEST(InitCertSf, ASignatureFileInLowerCaseIsNone) {
   EXPECT_EQ(log.records(), Records());
 }
 
-TEST(InitCertSf, ASignatureFileElsewhereIsNone) {
+TEST(InitCertSf, ASignatureFileElsewhereIsIgnored) {
   PackageOptions options;
   options.base_name = "OTHER/CERT";
   LogCapture log;
@@ -86,7 +86,7 @@ TEST(InitCertSf, ASignatureFileThatCannotBeExtractedFailsSilently) {
   }
 }
 
-TEST(InitCertSf, ASignatureFileThatDoesNotParseIsTheParsersMessageAlone) {
+TEST(InitCertSf, ASignatureFileThatDoesNotParseIsReportedByTheParserAlone) {
   EXPECT_EQ(LogOf(WithSignatureFile("Key:x")),
             Records({Error("Parse manifest: Error: P_COLON: unexpected 0x78 after colon: x\n")}));
 }
@@ -114,7 +114,7 @@ TEST(InitCertSf, BlocksOfOtherKindsAreNotLookedFor) {
   }
 }
 
-// The library's order of entries is its own; which comes first is asked of it.
+// The library has its own order of entries, so it is asked which comes first.
 TEST(InitCertSf, OfTwoSignersTheFirstInTheArchivesOrderDecides) {
   PackageOptions options;
   options.base_name = "META-INF/OTHER";
@@ -253,8 +253,8 @@ TEST(ValidateManifest, ANameThatIsTheSuffixAloneIsAMatchWithoutAnAlgorithm) {
                      Error("Can't validate manifest.\n"), Error("Can't validate manifest.\n")}));
 }
 
-// An empty expected digest is no digest to compare with, of whatever kind.
-TEST(ValidateManifest, AnEmptyMd5DigestIsRefusedWithoutASayingOnMd5) {
+// An empty expected digest is refused before its algorithm is looked at.
+TEST(ValidateManifest, AnEmptyMd5DigestIsRefusedWithoutAMessageAboutMd5) {
   EXPECT_EQ(LogOf(WithSignatureFile("MD5-Digest-Manifest: ====\r\n\r\n")),
             Records({Error("Can't validate manifest.\n"), Error("Can't validate manifest.\n")}));
 }

@@ -1,4 +1,4 @@
-// The signature block of a package: whose key it holds, and what that key signed.
+// The signature block of a package: the key that it holds, and what that key signed.
 #include <gtest/gtest.h>
 
 #include <algorithm>
@@ -51,7 +51,7 @@ TEST(VerifyCertificate, ExponentsOfOneByteVerify) {
   }
 }
 
-TEST(VerifyCertificate, WhatIsNoSignatureBlockIsAnUnknownType) {
+TEST(VerifyCertificate, BytesThatAreNotASignatureBlockAreAnUnknownType) {
   Package package = MakePackage();
   package.Item("META-INF/CERT.RSA").data = ToBytes("no block");
   testing::internal::CaptureStdout();
@@ -76,7 +76,7 @@ TEST(VerifyCertificate, AnEllipticCurveKeyIsAnUnknownType) {
   testing::internal::GetCapturedStdout();
 }
 
-TEST(VerifyCertificate, ACertificateOfAnotherIssuerFailsThoughTheSignatureIsGood) {
+TEST(VerifyCertificate, ACertificateOfAnotherIssuerFailsEvenWithAGoodSignature) {
   SignatureBlock block;
   block.issuer_key = "rsa-2048-other";
   EXPECT_EQ(LogOf(WithBlock(block)),
@@ -91,8 +91,8 @@ TEST(VerifyCertificate, ASignatureOverOtherBytesFails) {
                      Error(kNotVerified)}));
 }
 
-// What is taken for the signature is an AlgorithmIdentifier and what follows, of which no padding
-// comes out; the message itself is no help.
+// The bytes taken for the signature are an AlgorithmIdentifier and the element after it. They give
+// no padding, even if the message itself is signed.
 TEST(VerifyCertificate, AuthenticatedAttributesFail) {
   SignatureBlock block;
   block.authenticated_attributes = true;
@@ -131,8 +131,8 @@ TEST(VerifyCertificate, AnExponentThatRunsIntoTheModulusLengthStaysInTheBlock) {
 }
 
 TEST(VerifyCertificate, AModulusThatEndsWithTheBlockIsRead) {
-  // The exponent's second half says how long the modulus is: up to the block's last byte, then one
-  // more.
+  // The exponent's second half sets the length of the modulus: up to the block's last byte, then
+  // one more.
   const auto block_with_length = [](uint32_t length) {
     Bytes exponent = FromHex("01000100");
     for (int i = 0; i < 4; ++i) exponent.push_back(static_cast<uint8_t>(length >> (8 * i)));
@@ -165,7 +165,7 @@ TEST(VerifyCertificate, ASignatureThatTheBlockEndsBeforeFails) {
             Records({Error("RSA could not verify data: 5\n"), Error(kNotVerified)}));
 }
 
-// The package whose block holds, for the signature, what `encode` makes of it.
+// A package whose block holds the result of `encode` as its signature.
 template <typename Encode>
 PackageOptions WithEncodedSignature(Encode encode) {
   PackageOptions options;
@@ -197,7 +197,7 @@ TEST(VerifyCertificate, AShorterSignatureStringAtTheBlocksEndFails) {
             Records({Error("RSA could not verify data: 5\n"), Error(kNotVerified)}));
 }
 
-// VerifyCertificate by itself, on the block over this signature file.
+// The result of VerifyCertificate itself, for the block over this signature file.
 struct Verification {
   bool verified;
   Bytes key;

@@ -1,4 +1,4 @@
-// What the zip library's adapter makes of both generations of the library.
+// The adapter of the zip library, for both generations of the library.
 #include "apk/zip_library.h"
 
 #include <gtest/gtest.h>

@@ -1,10 +1,9 @@
-// The calls that Bionic's headers give another name in a build with _FORTIFY_SOURCE, as every
-// platform tree has: here they get it too (preset `fortify`), so that what the tests wrap is seen
-// to be what a program calls there. The C library of the workstation has the same functions, but
-// its headers call them in rare cases only.
+// In a build with _FORTIFY_SOURCE, as in every platform tree, Bionic's headers give some calls
+// another name. The preset `fortify` does the same here, to check that the tests wrap these names,
+// too. The workstation's C library has the same functions, but its headers rarely call them.
 //
-// Included before everything else in every file, by the compiler's -include. A function whose
-// parameter carries an object's size is another overload of the library's, and goes before it.
+// The compiler's -include puts this before everything else in every file. A function whose
+// parameter carries an object's size is an overload of the library's function, and is preferred.
 #pragma once
 
 #include <fcntl.h>

@@ -1,5 +1,5 @@
-// The zip library that is installed, in words that clash with neither generation of its header:
-// zipstring_library.cpp sees the old one, installed_library.cpp the library's own. Codes, life
+// The installed zip library under names that conflict with neither generation of its header:
+// zipstring_library.cpp includes the old one, installed_library.cpp the library's own. Codes, life
 // times and handles are the library's.
 #pragma once
 
@@ -26,7 +26,7 @@ int32_t Open(const char* file_name, void** archive);
 int32_t OpenFd(int fd, const char* debug_file_name, void** archive, bool assume_ownership);
 void Close(void* archive);
 int32_t Find(void* archive, std::string_view name, Entry* entry);
-// An empty filter is none.
+// An empty filter matches every name.
 int32_t Start(void* archive, void** cookie, std::string_view prefix, std::string_view suffix);
 int32_t Advance(void* cookie, Entry* entry, std::string_view* name);
 int32_t Extract(void* archive, const Entry& entry, uint8_t* begin, uint32_t size);

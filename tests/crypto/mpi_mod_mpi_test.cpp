@@ -1,4 +1,4 @@
-// The long division against GMP.
+// Long division, compared with GMP.
 #include <gtest/gtest.h>
 
 #include <ctime>
@@ -10,7 +10,7 @@ namespace {
 
 constexpr int kRounds = 150000;
 
-// Dividends that are arbitrary, or just beside a multiple of the divisor, where estimates fail.
+// Dividends are random, or right beside a multiple of the divisor, where estimates fail.
 TEST(MpiModMpi, IsTheNonNegativeRemainder) {
   Operands operands;
   for (int round = 0; round < kRounds; ++round) {
@@ -63,7 +63,7 @@ TEST(MpiModMpi, DoesNotLookAtTheDivisorsSign) {
   EXPECT_EQ(1, Value(R));  // 2^32 = 4 mod 7, 5 * 4 = 6 mod 7
 }
 
-// A shift that left the divisor's highest bit clear would make the digit's estimate wrap here.
+// A shift that leaves the divisor's highest bit clear would make the digit's estimate wrap here.
 TEST(MpiModMpi, EndsAtOnceForADivisorOfThirtyOneBitsAtTheTop) {
   Number A({0x8712b8bc, 0xffffffff, 0x4000fffe});
   Number B({0x00000001, 0x4000ffff});
@@ -96,9 +96,10 @@ TEST(MpiModMpi, OfTwoToThe8192ForAModulusOf128Limbs) {
   EXPECT_EQ(mpz_class(PowerOfTwo(8192) % Value(N)), Value(RR));
 }
 
-// d is 8000ffff. The half digit of 48000000 0000 is estimated as 9000 and leaves no rest, of which
-// 9000 * ffff are to be taken: d is added, which does not wrap but gives just d, and added again.
-// Who stopped at the first would go on with a digit far too large, and count it down by ones.
+// d is 8000ffff. The half digit of 48000000 0000 is estimated as 9000, with remainder 0. From that,
+// 9000 * ffff must be subtracted. Therefore d is added, which gives d without a wrap, and is added
+// again. Code that stopped after the first would get a far too large digit and count it down by
+// ones.
 TEST(MpiModMpi, EndsAtOnceWhereTheRestComesToTheDivisor) {
   const Number A({0x12345678, 0x0000abcd, 0x48000000});
   const Number B({0xfedcba98, 0x8000ffff});

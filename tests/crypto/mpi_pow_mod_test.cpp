@@ -1,4 +1,4 @@
-// Montgomery products and the exponentiation made of them, against GMP.
+// Montgomery products, and the exponentiation built on them, compared with GMP.
 #include <gtest/gtest.h>
 
 #include <algorithm>
@@ -12,7 +12,7 @@ namespace {
 
 constexpr int kRounds = 100000;
 
-// The exponents' bit lengths at which the window grows, with the window from there on.
+// The exponents' bit lengths at which the window grows, with the new window.
 constexpr struct {
   int bits;
   int window;
@@ -54,7 +54,7 @@ void ExpectPower(const mpz_class& a, const mpz_class& e, const Limbs& modulus) {
   ASSERT_EQ(expected, Value(X)) << modulus.size() << " limbs, exponent " << e;
 }
 
-// How many blocks an exponentiation asks for: those of the window's table, and always the same.
+// The number of allocations of an exponentiation: the window's table, and a constant number.
 int AllocationsForExponent(const mpz_class& e) {
   const Number N({0xfffffff1, 0xfffffff1});
   const Number A({3});
@@ -120,8 +120,8 @@ TEST(MpiMontmul, SubtractsAlsoWhereTheProductIsBelowTheModulus) {
   Number T(Limbs(4));
   mpi_montmul(&A, &B, &N, 1, &T);
   EXPECT_EQ(15, Value(A));
-  // The scratch limbs held A's old limb 3 below the product 15: the subtraction that nobody needs
-  // left 3 - 15 there, with a borrow from the limb above.
+  // The scratch limbs held A's old limb 3 below the product 15. The superfluous subtraction left 3
+  // - 15 there, and borrowed from the limb above.
   EXPECT_EQ(static_cast<uint32_t>(3 - 15), T.p[0]);
   EXPECT_EQ(14u, T.p[1]);
 }
@@ -173,7 +173,7 @@ TEST(MpiPowMod, UsesAWindowOfOneForExponents3And65537) {
   EXPECT_EQ(AllocationsForExponent(1), AllocationsForExponent(PowerOfTwo(23) - 1));
 }
 
-// The table of a window of w bits holds 2^(w-1) powers beside the first; there is none of 2 bits.
+// The table of a window of w bits holds 2^(w-1) powers besides the first. No window has 2 bits.
 TEST(MpiPowMod, WidensTheWindowWithTheExponent) {
   const int fixed = AllocationsForExponent(1);
   int before = fixed;

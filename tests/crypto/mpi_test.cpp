@@ -1,5 +1,5 @@
-// The integers against GMP: at least 100,000 operands an operation, from limbs that provoke
-// carries.
+// The integers, compared with GMP: at least 100,000 operands per operation, made of limbs that
+// provoke carries.
 #include "crypto/mpi.h"
 
 #include <gtest/gtest.h>
@@ -96,7 +96,7 @@ TEST(MpiGrow, KeepsTheValueAndAddsZeros) {
   }
 }
 
-TEST(MpiAssign, CopiesTheValueAndClearsWhatWasThere) {
+TEST(MpiAssign, CopiesTheValueAndClearsTheOldLimbs) {
   Operands operands;
   for (int round = 0; round < kRounds; ++round) {
     Number X(operands.Magnitude(8), operands.Sign());
@@ -164,7 +164,7 @@ TEST(MpiCompare, ZeroLiesBetweenTheNegativeAndThePositiveNumbers) {
   }
 }
 
-TEST(MpiCompare, TwoZerosAreEqualWhateverTheirSigns) {
+TEST(MpiCompare, TwoZerosAreEqualWithAnySigns) {
   Number zero({0});
   Number negative({0, 0}, -1);
   EXPECT_EQ(0, mpi_compare(&zero, &negative));
@@ -402,7 +402,7 @@ TEST(Mpi, ReportsEachAllocationThatFails) {
     Number R;
     return mpi_mod_mpi(&R, &A, &B);
   });
-  // A remainder that is negative at first.
+  // The remainder is negative at first.
   const Number divisor({7, 0xffff});
   ExpectNoMemoryAtEveryAllocation([&] {
     Number R;

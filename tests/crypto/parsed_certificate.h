@@ -1,4 +1,4 @@
-// A certificate with what x509_certificate_parse makes of it, for the tests of the parser.
+// A certificate and the record that x509_certificate_parse makes of it, for the parser's tests.
 #pragma once
 
 #include <string>
@@ -7,14 +7,14 @@
 #include "support/certificate.h"
 #include "support/guarded_bytes.h"
 
-// The signature does not matter to the parser: made up, it costs nothing.
+// The parser ignores the signature. An invented one takes no time to make.
 inline Certificate Unsigned() {
   Certificate certificate;
   certificate.signature = der::BitString(Bytes(8, 0x5a));
   return certificate;
 }
 
-// Parsed where memory ends, so that reading past it is caught.
+// Parsed where memory ends, so that reading past it crashes.
 struct ParsedCertificate {
   explicit ParsedCertificate(const Bytes& der) : bytes(der) {
     result = x509_certificate_parse(bytes.data(), bytes.size(), &cert);

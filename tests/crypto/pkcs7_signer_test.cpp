@@ -1,4 +1,4 @@
-// The first SignerInfo, and what no damage to a block may do.
+// The first SignerInfo, and damaged blocks.
 #include <gtest/gtest.h>
 
 #include <cstdlib>
@@ -18,7 +18,7 @@ SignatureBlock WithSigners(const Bytes& signer_infos) {
   return block;
 }
 
-// A SET of one SignerInfo, of a good start and these elements.
+// A SET of one SignerInfo, with a good start and then these elements.
 Bytes SignerOf(const std::vector<Bytes>& elements) {
   return der::Set({der::Sequence({der::Integer(1), der::Sequence({}), Concat(elements)})});
 }
@@ -28,13 +28,13 @@ const Bytes& Sha256Algorithm() {
   return algorithm;
 }
 
-// A block of indefinite lengths that ends in these bytes, which follow its certificate.
+// A block of indefinite lengths. Its certificate is followed by these bytes, which end the block.
 Bytes BlockEndingInSigners(const Bytes& signers) {
   return BlockEndingIn(
       Concat({der::Context(0, *WithRsaKey(Bytes(64, 0x77), {3}).certificates), signers}));
 }
 
-// Whether all that lies in the block according to the record does.
+// True if the parts of the record that must lie in the block do.
 bool Inside(const GuardedBytes& block, const pkcs7& record) {
   const auto inside = [&](const uint8_t* value, size_t length) {
     if (value == nullptr) return length == 0;
@@ -46,7 +46,7 @@ bool Inside(const GuardedBytes& block, const pkcs7& record) {
          inside(record.signed_digest, 0);
 }
 
-// The block, damaged before the call.
+// True if the record of this damaged block stays inside it.
 bool StaysInside(const GuardedBytes& block) {
   pkcs7 record = {};
   const int result = processCert(block.data(), static_cast<uint32_t>(block.size()), &record);
@@ -77,7 +77,7 @@ TEST(ProcessCertSigner, SignersThatWouldStartBeyondTheEndGiveTheUnreadableLine) 
   EXPECT_EQ(processed.output, std::string(kUnreadable) + kSignerTrailer);
 }
 
-// Each of these elements may run on beyond what holds it, but not beyond the block.
+// Each of these elements may end beyond its container, but not beyond the block.
 TEST(ProcessCertSigner, SignersAndTheirFirstMayEndWithTheBlock) {
   const Bytes signer = der::Sequence({der::Integer(1), der::Sequence({}), Sha256Algorithm(),
                                       AlgorithmIdentifier("1.2.3"), der::OctetString(Bytes(8, 1))});
@@ -93,8 +93,8 @@ TEST(ProcessCertSigner, SignersAndTheirFirstMayEndWithTheBlock) {
 }
 
 TEST(ProcessCertSigner, VersionAndIssuerMayEndWithTheBlock) {
-  // A signer of no contents, so that the digestAlgorithm is missed once the two were read: a
-  // version and an issuer that end with the block, and either of them a byte longer.
+  // The signer has no contents, so the digestAlgorithm is missing after the version and the issuer.
+  // Both end with the block; then either is one byte longer.
   const std::pair<const char*, const char*> cases[] = {
       {"31 00 30 00 02 03 01 02 03 30 00", kNoAlgorithm},
       {"31 00 30 00 02 04 01 02 03 30 00", kUnreadable},
@@ -111,7 +111,7 @@ TEST(ProcessCertSigner, VersionAndIssuerMayEndWithTheBlock) {
 TEST(ProcessCertSigner, MalformedDigestAlgorithmGivesItsLine) {
   const Bytes rest = Concat({AlgorithmIdentifier("1.2.3"), der::OctetString(Bytes(8))});
   const Bytes cases[] = {
-      SignerOf({}),                                               // none
+      SignerOf({}),                                               // missing
       SignerOf({{0x30}}),                                         // half of a header
       SignerOf({der::Set({der::Oid("1.2.3")}), rest}),            // no SEQUENCE
       SignerOf({der::Context(16, der::Oid("1.2.3")), rest}),      // another class
@@ -129,7 +129,7 @@ TEST(ProcessCertSigner, MalformedDigestAlgorithmGivesItsLine) {
 }
 
 TEST(ProcessCertSigner, DigestAlgorithmMustEndWithinTheSignerInfo) {
-  // The same bytes, with the SignerInfo ending before the digestAlgorithm, within and after it.
+  // The same bytes three times: the SignerInfo ends before, within and after the digestAlgorithm.
   const Bytes start = Concat({der::Integer(1), der::Sequence({})});
   const Bytes rest = Concat({AlgorithmIdentifier("1.2.3"), der::OctetString(Bytes(8, 1))});
   const size_t algorithm_end = start.size() + Sha256Algorithm().size();
@@ -152,7 +152,7 @@ TEST(ProcessCertSigner, AnyDigestAlgorithmAndParametersAreAccepted) {
 }
 
 TEST(ProcessCertSigner, MissingEncryptedDigestGivesTheUnreadableLine) {
-  // No digestEncryptionAlgorithm, half of one's header, no encryptedDigest, half of one's header.
+  // No digestEncryptionAlgorithm, half of its header, no encryptedDigest, half of its header.
   const Bytes algorithm = AlgorithmIdentifier("1.2.3");
   for (const Bytes& rest : {Bytes(), Bytes{0x30}, algorithm, Concat({algorithm, {0x04}}),
                             Concat({algorithm, {0x1f}})}) {
@@ -226,7 +226,7 @@ TEST(ProcessCertBounds, EveryTruncationIsRefused) {
 }
 
 TEST(ProcessCertBounds, EveryTruncationOfABlockOfIndefiniteLengthsStaysInside) {
-  // The SignerInfo ends with its digestAlgorithm, so that it is read as long as that is there.
+  // The SignerInfo ends with its digestAlgorithm, so the block reads as long as that is present.
   const Bytes whole = BlockEndingInSigners(Concat({
       FromHex("31 80 30 14 02 01 01 30 80"),
       Sha256Algorithm(),
@@ -262,8 +262,8 @@ TEST(ProcessCertBounds, EveryChangeOfOneByteStaysInside) {
 }
 
 TEST(ProcessCert, BlockMadeByOpensslIsRead) {
-  const TempDir folder;
-  const std::string base = folder / "block";
+  const TempDir directory;
+  const std::string base = directory / "block";
   const std::string key = TestKeyPath("rsa-2048");
   WriteFile(base + ".sf", kSignatureFile);
   const std::string command = "openssl req -x509 -new -key " + key + " -subj /CN=Test -out " +

@@ -12,7 +12,7 @@
 
 namespace {
 
-// Where `part` is in `whole`; fails the test when it is nowhere.
+// The offset of `part` in `whole`. The test fails if `part` is missing.
 size_t Find(const Bytes& whole, const Bytes& part) {
   const auto found = std::search(whole.begin(), whole.end(), part.begin(), part.end());
   EXPECT_NE(found, whole.end());
@@ -83,8 +83,8 @@ TEST(ProcessCertHeader, UnreadableContentTypeGivesThePlainLine) {
 }
 
 TEST(ProcessCertHeader, UnreadableLaterHeadersGiveTheirTagAndTheDistanceToNull) {
-  // The elements before, then an octet that starts an element and nothing else: the [0] of the
-  // content, the SignedData, its version, digestAlgorithms, contentInfo and certificates.
+  // The elements before, and then one octet that starts the [0] of the content, the SignedData, its
+  // version, digestAlgorithms, contentInfo or certificates.
   const std::pair<const char*, int32_t> cases[] = {
       {"30 04 06 01 2a a0", 0},
       {"30 06 06 01 2a a0 01 30", 16},
@@ -113,7 +113,7 @@ TEST(ProcessCertHeader, TagIsPrintedAsASignedNumber) {
 }
 
 TEST(ProcessCertHeader, HeaderThatWouldStartAtOrBeyondTheEndHasTagZero) {
-  // The contentType ends with the block, and two bytes beyond it.
+  // The contentType ends with the block, then two bytes beyond it.
   for (const char* digits : {"30 03 06 01 2a", "30 03 06 03 2a"}) {
     const ProcessedBlock processed(FromHex(digits));
     EXPECT_EQ(processed.result, 1);
@@ -122,8 +122,8 @@ TEST(ProcessCertHeader, HeaderThatWouldStartAtOrBeyondTheEndHasTagZero) {
 }
 
 TEST(ProcessCertHeader, LengthsAreComparedWithTheWholeBlockFromEachPosition) {
-  // Of the elements before the certificates, the SignedData may run past the block's end as long as
-  // its length is no more than the block's, less its own header.
+  // One element before the certificates, the SignedData, may end beyond the block. Its length may
+  // be the block's, less its own header, at most.
   Bytes bytes = WithRsaKey(Bytes(64, 0x77), {3}).Build(kSignatureFile);
   const size_t signed_data = Find(bytes, FromHex("02 01 01 31")) - 4;
   ASSERT_EQ(bytes[signed_data + 1], 0x82);
@@ -167,7 +167,7 @@ TEST(ProcessCertCertificate, SetThatRunsPastTheEndIsReadUpToTheEnd) {
   certificates.pop_back();
   EXPECT_EQ(ProcessedBlock(BlockEndingIn(certificates)).output,
             "CERT_PARCER [ERROR]: x509_certificate_parse() error -3\n");
-  // Nothing but the header of the [0] is left.
+  // Only the header of the [0] is left.
   EXPECT_EQ(ProcessedBlock(BlockEndingIn(FromHex("a0 05"))).output,
             "CERT_PARCER [ERROR]: x509_certificate_parse() error -2\n");
 }
@@ -187,14 +187,14 @@ TEST(ProcessCertKey, EcPointGivesTheSequenceLine) {
   EXPECT_EQ(processed.record.modulus, nullptr);
 }
 
-TEST(ProcessCertKey, EcPointWhoseSecondByteIsNoFittingLengthGivesTheUnreadableLine) {
+TEST(ProcessCertKey, EcPointWhoseSecondByteIsAWrongLengthGivesTheUnreadableLine) {
   const ProcessedBlock processed(WithPublicKey(Concat({{0x04, 0x7f}, Bytes(63, 0x11)})));
   EXPECT_EQ(processed.result, 1);
   EXPECT_EQ(processed.output, std::string(kUnreadable) + kKeyTrailer);
 }
 
 TEST(ProcessCertKey, UnreadableKeyGivesTheUnreadableLine) {
-  // Nothing, a SEQUENCE that runs past the end, one without a modulus, one with half of one.
+  // No bytes, a SEQUENCE that ends beyond the key, one without a modulus, one with half of one.
   for (const char* digits : {"", "30", "30 05 02 01 03", "30 00", "30 01 02", "30 02 02 05"}) {
     const ProcessedBlock processed(WithPublicKey(FromHex(digits)));
     EXPECT_EQ(processed.result, 1);
@@ -202,7 +202,7 @@ TEST(ProcessCertKey, UnreadableKeyGivesTheUnreadableLine) {
   }
 }
 
-// What the key lacks stands right behind its BIT STRING, in a tbsCertificate whose other fields are
+// The missing part of the key follows its BIT STRING, in a tbsCertificate whose other fields are
 // not read.
 TEST(ProcessCertKey, KeyEndsWithItsBitString) {
   const Bytes key = der::Sequence({der::Integer(Bytes(64, 0x77)), der::Integer(3)});
@@ -243,7 +243,7 @@ TEST(ProcessCertKey, ClassesAreNotLookedAt) {
   EXPECT_EQ(Field(processed.record.modulus, processed.record.modulus_length), modulus);
 }
 
-TEST(ProcessCertKey, ModulusThatIsNoIntegerGivesTheIntegerLine) {
+TEST(ProcessCertKey, ModulusThatIsNotAnIntegerGivesTheIntegerLine) {
   const ProcessedBlock processed(
       WithPublicKey(der::Sequence({der::OctetString(Bytes(64, 0x77)), der::Integer(3)})));
   EXPECT_EQ(processed.result, 1);
@@ -270,7 +270,7 @@ TEST(ProcessCertKey, ModulusLosesExactlyOneZero) {
   EXPECT_EQ(Field(processed.record.modulus, processed.record.modulus_length), rest);
 }
 
-// A modulus of no bytes, which a zero follows, one of a zero, and one of two.
+// An empty modulus that a zero follows, a modulus of one zero, and one of two.
 TEST(ProcessCertKey, EmptyModulusLeavesNoRoomForTheExponent) {
   const std::pair<const char*, uint32_t> cases[] = {
       {"30 03 02 00 00", 0}, {"30 06 02 01 00 02 01 03", 0}, {"30 07 02 02 00 00 02 01 03", 1}};
@@ -291,7 +291,7 @@ TEST(ProcessCertKey, ExponentIsComparedWithTheLengthOfTheModulus) {
   EXPECT_EQ(processed.record.modulus_length, 4u);
 }
 
-// The zero that the record leaves out counts: five bytes.
+// The record leaves out the leading zero, but the zero counts: five bytes.
 TEST(ProcessCertKey, ExponentIsComparedWithTheLengthOfTheModulusAsWritten) {
   const ProcessedBlock processed(WithRsaKey(Concat({{0x00}, Bytes(4, 0x77)}), {1, 0, 1}));
   EXPECT_EQ(processed.result, 0);
@@ -306,7 +306,7 @@ TEST(ProcessCertKey, ExponentMayStandBehindTheKey) {
   EXPECT_EQ(processed.record.exponent[0], 3);
 }
 
-TEST(ProcessCertKey, ExponentThatIsNoIntegerGivesTheIntegerLine) {
+TEST(ProcessCertKey, ExponentThatIsNotAnIntegerGivesTheIntegerLine) {
   const ProcessedBlock processed(
       WithPublicKey(der::Sequence({der::Integer(Bytes(64, 0x77)), der::OctetString({3})})));
   EXPECT_EQ(processed.result, 1);
@@ -315,7 +315,8 @@ TEST(ProcessCertKey, ExponentThatIsNoIntegerGivesTheIntegerLine) {
 }
 
 TEST(ProcessCertKey, ExponentMustLieInTheBlock) {
-  // Its header ends the key; its length takes in the rest of the block and fits the modulus.
+  // The exponent's header ends the key. Its length covers the rest of the block and fits the
+  // modulus.
   SignatureBlock block =
       WithPublicKey(Concat({der::Sequence({der::Integer(Bytes(200, 0x77))}), {0x02, 0x81, 0x00}}));
   block.signer_infos = Bytes();
@@ -349,7 +350,7 @@ TEST(ProcessCertKey, ExponentIsCopiedAsItIsWithZerosBehind) {
   }
 }
 
-TEST(ProcessCertKey, ExponentEndsInZerosWhateverTheRecordHeld) {
+TEST(ProcessCertKey, ExponentEndsInZerosAlsoInAUsedRecord) {
   const Bytes block = WithRsaKey(Bytes(64, 0x77), {3}).Build(kSignatureFile);
   pkcs7 record;
   memset(&record, 0x11, sizeof(record));

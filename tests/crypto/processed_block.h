@@ -1,4 +1,5 @@
-// A signature block with what processCert makes of it, for the tests of the walk through it.
+// A signature block and the record that processCert makes of it, for the tests of the walk through
+// it.
 #pragma once
 
 #include <gtest/gtest.h>
@@ -10,7 +11,7 @@
 #include "support/guarded_bytes.h"
 #include "support/signature_block.h"
 
-// What is printed.
+// The printed lines.
 inline constexpr char kHeaderTrailer[] = "CERT_PARCER [ERROR]: processPKCS7Header() error\n";
 inline constexpr char kKeyTrailer[] = "CERT_PARCER [ERROR]: processPublicKey() error\n";
 inline constexpr char kSignerTrailer[] = "CERT_PARCER [ERROR]: processSignHeader() error\n";
@@ -25,7 +26,7 @@ inline constexpr char kNoAlgorithm[] =
 
 inline const Bytes kSignatureFile = ToBytes("Signature-Version: 1.0\r\n\r\n");
 
-// Read where memory ends, so that reading past it is caught.
+// The block ends where memory ends, so that reading past it crashes.
 struct ProcessedBlock {
   explicit ProcessedBlock(const Bytes& block) : bytes(block) {
     testing::internal::CaptureStdout();
@@ -37,8 +38,8 @@ struct ProcessedBlock {
   ProcessedBlock(const ProcessedBlock&) = delete;
   ProcessedBlock& operator=(const ProcessedBlock&) = delete;
 
-  // The line of a header that could not be read, of which `tag` was decoded: its offset is the
-  // distance from the block to the null address, modulo the size of the address space.
+  // The line about an unreadable header whose tag was decoded as `tag`. Its offset is the distance
+  // from the block to the null address, modulo the size of the address space.
   std::string UnreadableTag(int32_t tag) const {
     char line[128];
     snprintf(line, sizeof(line),
@@ -54,8 +55,8 @@ struct ProcessedBlock {
   std::string output;
 };
 
-// A block around a certificate with this RSAPublicKey, or whatever else is to stand there. The
-// signatures are made up.
+// A block around a certificate with this RSAPublicKey or other contents. The signatures are
+// invented.
 inline SignatureBlock WithPublicKey(const Bytes& public_key) {
   SignatureBlock block;
   Certificate certificate;
@@ -70,8 +71,8 @@ inline SignatureBlock WithRsaKey(const Bytes& modulus, const Bytes& exponent) {
   return WithPublicKey(der::Sequence({der::Integer(modulus), der::Integer(exponent)}));
 }
 
-// A block that ends in these bytes, the [0] of the certificates first. The elements around it have
-// the indefinite form, which no end of the block is too early for.
+// A block that ends with these bytes, which start with the [0] of the certificates. The elements
+// around them have the indefinite form, so they fit before any end of the block.
 inline Bytes BlockEndingIn(const Bytes& certificates) {
   return Concat({FromHex("30 80"), der::Oid("1.2.840.113549.1.7.2"),
                  FromHex("a0 80 30 80 02 01 01 31 00 30 00"), certificates});

@@ -1,4 +1,4 @@
-// Signatures by libcrypto, and blocks made by hand and signed with a bare private operation.
+// Signatures by libcrypto, and blocks made by hand and signed with only the private operation.
 #include "crypto/rsa.h"
 
 #include <gtest/gtest.h>
@@ -156,7 +156,7 @@ TEST(RsaPkcs1Verify, EveryByteOfTheDigestInfoPrefixCounts) {
   }
 }
 
-TEST(RsaPkcs1Verify, AnotherMdPrefixFailsSilentlyWhateverTheAlgorithm) {
+TEST(RsaPkcs1Verify, AnotherMdPrefixFailsSilentlyWithAnyAlgorithm) {
   const FixedKey key("rsa-1024");
   LogCapture log;
   for (size_t i = 0; i < 18; ++i) {
@@ -181,7 +181,7 @@ TEST(RsaPkcs1Verify, EveryByteOfThePaddingCounts) {
   EXPECT_EQ(log.records(), kNoRecords);
 }
 
-// RFC 2313 §8.1 has the types 0 and 2 as well, of encryption and of the private key's operation.
+// RFC 2313 §8.1 also defines the types 0 and 2, for the private key's operation and for encryption.
 TEST(RsaPkcs1Verify, BlockOfAnotherTypeThan1IsInvalidPadding) {
   const FixedKey key("rsa-1024");
   LogCapture log;
@@ -224,7 +224,7 @@ TEST(RsaPkcs1Verify, PaddingOfFewerThanEightBytesIsAccepted) {
   }
 }
 
-// Of the greatest length too, whose block ends where the verifier's buffer does.
+// Also of the greatest length, whose block ends where the verifier's buffer ends.
 TEST(RsaPkcs1Verify, PaddingWithoutASeparatorIsInvalid) {
   LogCapture log;
   for (const char* name : {"rsa-1024", "rsa-4096"}) {
@@ -235,8 +235,8 @@ TEST(RsaPkcs1Verify, PaddingWithoutASeparatorIsInvalid) {
   EXPECT_EQ(log.records(), kNoRecords);
 }
 
-// The padding of a shorter block ends where a longer one, which was recovered just before in the
-// same place, had a zero.
+// The verifier has just recovered a longer block in the same place. That block has a zero where the
+// padding of the shorter one ends.
 TEST(RsaPkcs1Verify, PaddingThatRunsToTheLastByteIsNotReadBeyondIt) {
   const FixedKey longer("rsa-2048");
   const FixedKey shorter("rsa-1024");
@@ -299,7 +299,7 @@ TEST(RsaPkcs1Verify, NegativeLengthIsBadInput) {
   EXPECT_EQ(5, Verify(context, Bytes(1)));
 }
 
-// A block of 16 bytes has no room for any digest.
+// A block of 16 bytes is too short for any digest.
 TEST(RsaPkcs1Verify, LengthOf16IsAccepted) {
   const SmallKey key(16);
   LogCapture log;
@@ -338,7 +338,7 @@ TEST(RsaPkcs1Verify, EvenModulusReturns20) {
   EXPECT_EQ(log.records(), kNoRecords);
 }
 
-// The length of such a context was changed after the key was set.
+// The context's length was changed after the key was set.
 TEST(RsaPkcs1Verify, ResultLongerThanTheLengthReturns24) {
   FixedKey key("rsa-1024");
   key.context.len = 127;
@@ -423,7 +423,7 @@ TEST(RsaSetKey, NullModulusGivesAnEmptyKeyThatVerifiesNothing) {
   EXPECT_EQ(5, Verify(context, Bytes(128)));
 }
 
-TEST(RsaSetKey, DiscardsWhatTheContextHeld) {
+TEST(RsaSetKey, DiscardsTheContextsOldKey) {
   const Bytes modulus(16, 0xFF);
   rsa_local context;
   context.N = {-1, 7, nullptr};
@@ -449,7 +449,7 @@ TEST(RsaSetKey, ReadsTheExponentValueAsASignedNumber) {
   }
 }
 
-// The exponent's buffer ends where it must not be read further.
+// Memory ends right after the last byte of the exponent that may be read.
 TEST(RsaSetKey, ReadsExactlyAsManyBytesOfTheExponentAsTheModulusHas) {
   const FixedKey key("rsa-1024");
   Bytes bytes(128, 0);

@@ -1,4 +1,4 @@
-// The certificates of Debian's ca-certificates, as `openssl x509` reads them.
+// The certificates of Debian's ca-certificates, compared with the output of `openssl x509`.
 #include <gtest/gtest.h>
 #include <openssl/bio.h>
 #include <openssl/mem.h>
@@ -15,19 +15,19 @@
 
 namespace {
 
-constexpr char kFolder[] = "/usr/share/ca-certificates";
+constexpr char kDirectory[] = "/usr/share/ca-certificates";
 
 std::vector<std::string> CertificateFiles() {
   std::vector<std::string> files;
   std::error_code error;
-  for (const auto& entry : std::filesystem::recursive_directory_iterator(kFolder, error)) {
+  for (const auto& entry : std::filesystem::recursive_directory_iterator(kDirectory, error)) {
     if (entry.path().extension() == ".crt") files.push_back(entry.path());
   }
   std::sort(files.begin(), files.end());
   return files;
 }
 
-// What the command writes; of a failure the output is short of something.
+// The output of the command. If the command fails, some of it is missing.
 std::string OutputOf(const std::string& command) {
   FILE* pipe = popen(command.c_str(), "r");
   if (pipe == nullptr) return "";
@@ -38,8 +38,8 @@ std::string OutputOf(const std::string& command) {
   return output;
 }
 
-// What openssl says of the certificate: names as one attribute a line, with the object identifier
-// in digits and the value as the DER of the string.
+// openssl's description of the certificate. Names have one attribute per line: the object
+// identifier in digits, and the value as the DER of the string.
 std::vector<std::string> OpensslLines(const std::string& file) {
   std::istringstream output(
       OutputOf("exec openssl x509 -noout -in '" + file +
@@ -51,7 +51,7 @@ std::vector<std::string> OpensslLines(const std::string& file) {
   return lines;
 }
 
-// The DER in the PEM file; empty when it cannot be read.
+// The DER in the PEM file; empty if it cannot be read.
 Bytes DerOf(const std::string& file) {
   bssl::UniquePtr<BIO> bio(BIO_new_file(file.c_str(), "r"));
   char* name = nullptr;
@@ -66,7 +66,7 @@ Bytes DerOf(const std::string& file) {
   return der;
 }
 
-// The text after `start` on the one line that starts so; empty when there is none.
+// The rest of the one line that begins with `start`; empty if no line does.
 std::string After(const std::vector<std::string>& lines, const std::string& start) {
   for (const std::string& line : lines) {
     if (line.compare(0, start.size(), start) == 0) return line.substr(start.size());
@@ -123,7 +123,7 @@ std::vector<std::string> OpensslNameLines(const std::vector<std::string>& lines,
     const size_t equals = line->find("=#");
     const auto type = types.find(line->substr(4, equals - 4));
     if (type == types.end()) continue;
-    // A string of less than 128 bytes: two octets of header.
+    // A string of fewer than 128 bytes has two header octets.
     kept.push_back(std::to_string(type->second) + " " + line->substr(equals + 2 + 4));
   }
   return kept;
@@ -189,7 +189,7 @@ void ExpectAsOpensslReads(const x509_certificate& cert, const std::vector<std::s
 
 TEST(X509Authorities, EveryCertificateReadsAsOpensslReadsIt) {
   const std::vector<std::string> files = CertificateFiles();
-  ASSERT_FALSE(files.empty()) << "no certificates in " << kFolder;
+  ASSERT_FALSE(files.empty()) << "no certificates in " << kDirectory;
   uint32_t extensions_seen = 0;
   for (const std::string& file : files) {
     SCOPED_TRACE(file);
@@ -200,6 +200,6 @@ TEST(X509Authorities, EveryCertificateReadsAsOpensslReadsIt) {
     ExpectAsOpensslReads(parsed.cert, lines);
     extensions_seen |= parsed.cert.extensions_present;
   }
-  // So that none of the comparisons is an empty one.
+  // Makes sure that every comparison had something to compare.
   EXPECT_EQ(extensions_seen & 7u, kX509BasicConstraints | kX509PathLenConstraint | kX509KeyUsage);
 }

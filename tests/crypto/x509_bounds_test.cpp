@@ -1,6 +1,6 @@
-// Elements that run on beyond what holds them, into bytes that would do: each certificate here
-// would be read to its end if the element were allowed those bytes. And what may follow the last
-// element that is read.
+// Elements that end beyond their containers, in bytes that would be valid there. Each certificate
+// would be read to its end if the element might use those bytes. Also the bytes that may follow the
+// last element that is read.
 #include <gtest/gtest.h>
 
 #include "crypto/parsed_certificate.h"
@@ -13,7 +13,7 @@ constexpr char kSubjectAltName[] = "2.5.29.17";
 constexpr char kBasicConstraints[] = "2.5.29.19";
 constexpr char kUnknown[] = "1.2.3.4";
 
-// The element with a length of `more` bytes more than it has; both lengths have one octet.
+// The element with a length that is greater by `more` bytes. Both lengths have one octet.
 Bytes RunningOn(Bytes element, size_t more = 1) {
   EXPECT_LT(element[1] + more, 0x80u);
   element[1] = static_cast<uint8_t>(element[1] + more);
@@ -82,7 +82,7 @@ TEST(X509RunningOn, ElementsOfANameAreMinus12) {
   EXPECT_EQ(ResultOf(WithSubject(der::Sequence({der::Set({attribute})}))), 0);
   const Bytes cases[] = {
       der::Sequence({RunningOn(der::Set({attribute}))}),                        // the SET
-      der::Sequence({der::Set({RunningOn(attribute)})}),                        // what it holds
+      der::Sequence({der::Set({RunningOn(attribute)})}),                        // its contents
       der::Sequence({der::Set({der::Sequence({type, RunningOn(Value())})})}),   // a value
       der::Sequence({der::Set({der::Sequence({RunningOn(type, 7)}), Value()})}  // a type
                     )};
@@ -95,8 +95,8 @@ TEST(X509RunningOn, ElementsOfANameAreMinus12) {
   }
 }
 
-// What the element takes is all there, and belongs to what holds its container.
-TEST(X509RunningOn, ElementsOfANameMayNotTakeWhatFollowsTheirContainer) {
+// The bytes that the element takes exist, but belong to the element around its container.
+TEST(X509RunningOn, ElementsOfANameMayNotTakeBytesAfterTheirContainer) {
   const Bytes type = der::Oid(kCommonName);
   const Bytes attribute = der::Sequence({type, Value()});
   const Bytes rdn = der::Set({attribute});
@@ -116,7 +116,7 @@ TEST(X509RunningOn, ElementsOfANameMayNotTakeWhatFollowsTheirContainer) {
   for (const Bytes& name : cases) EXPECT_EQ(ResultOf(WithSubject(name)), -12);
 }
 
-// The time is short of two bytes, and the subject, of 90 bytes, begins 30 5a: the text "0Z".
+// The time lacks two bytes. The subject after it, of 90 bytes, begins with 30 5a: the text "0Z".
 TEST(X509RunningOn, TimeIsMinus13) {
   Certificate certificate = WithSubject(Name({{kCommonName, std::string(79, 'x')}}));
   ASSERT_EQ(certificate.subject[0], '0');
@@ -141,7 +141,7 @@ TEST(X509RunningOn, KeyIsMinus14) {
   EXPECT_EQ(ResultOf(certificate), -14);
 }
 
-// All of it lies in the tbsCertificate, but not in the SEQUENCE that should hold it.
+// All of it lies in the tbsCertificate, but not in the SEQUENCE that should contain it.
 TEST(X509RunningOn, KeyBehindItsInfoIsMinus14) {
   const Bytes algorithm = AlgorithmIdentifier("1.2.3");
   const Bytes key = der::BitString({1, 2, 3});
@@ -157,7 +157,7 @@ TEST(X509RunningOn, KeyBehindItsInfoIsMinus14) {
   }
 }
 
-// What follows the [3] is an Extension, too.
+// An Extension follows the [3].
 TEST(X509RunningOn, SequenceOfExtensionsIsMinus15) {
   const Bytes extension = Extension(kUnknown, der::Null());
   const Bytes extensions = der::Sequence({extension});
@@ -206,7 +206,7 @@ TEST(X509RunningOn, ElementsOfAValueAreMinus15) {
   const Bytes ca = der::Boolean(0xff);
   const Bytes length = der::Integer(3);
   const auto result_of = [](const std::string& oid, const Bytes& sequence) {
-    // The byte that the element would take is the value's, behind the SEQUENCE.
+    // The byte that the element would take is part of the value, after the SEQUENCE.
     return ResultOfExtensions({Extension(oid, Concat({sequence, {0}}))});
   };
   EXPECT_EQ(result_of(kBasicConstraints, der::Sequence({ca, length})), 0);
@@ -243,13 +243,13 @@ TEST(X509Trailing, LoneByteAfterTheKeyIsMinus5) {
   Certificate certificate = Unsigned();
   certificate.tbs_tail = {0xa4};
   EXPECT_EQ(ResultOf(certificate), -5);
-  // But a v1 certificate has no fields there that would be read.
+  // A v1 certificate has no fields to read there.
   certificate.version = {};
   EXPECT_EQ(ResultOf(certificate), 0);
 }
 
-// Half of a header, where the rest of each element is not looked at.
-TEST(X509Trailing, WhatFollowsTheLastElementThatIsReadIsIgnored) {
+// Half of a header follows the last element that is read in each container.
+TEST(X509Trailing, BytesAfterTheLastElementThatIsReadAreIgnored) {
   const Bytes rest = {0x30};
   const Bytes time = der::Element(der::kUtcTime, "200102030405Z");
   const Bytes algorithm = der::Sequence({der::Oid("1.2.3"), der::Oid("1.2.4"), rest});

@@ -1,4 +1,4 @@
-// Extensions of a certificate.
+// The extensions of a certificate.
 #include <gtest/gtest.h>
 
 #include "crypto/parsed_certificate.h"
@@ -17,7 +17,7 @@ Certificate With(std::vector<Bytes> extensions) {
   return certificate;
 }
 
-// An Extension of raw elements: whatever stands for critical flag and value.
+// An Extension whose critical flag and value are replaced by `rest`.
 Bytes RawExtension(const std::string& oid, const Bytes& rest) {
   return der::Sequence({der::Oid(oid), rest});
 }
@@ -68,8 +68,9 @@ TEST(X509Extensions, FalseWrittenOutIsRefused) {
 
 TEST(X509Extensions, TrueOfAnotherByteIsReadAsAnIdentifier) {
   const Bytes value = der::OctetString(DigitalSignature());
-  // 0x01 starts a BOOLEAN; 0xdf, as 0xff, a long-form tag of the private class; 0x5f and 0x9f one
-  // of the application and context-specific classes; 0x1f one of the universal class.
+  // 0x01 starts a BOOLEAN. 0xdf, like 0xff, starts a long-form tag of the private class; 0x5f and
+  // 0x9f start one of the application and context-specific classes; 0x1f one of the universal
+  // class.
   const std::pair<uint8_t, int> cases[] = {
       {0x01, -15}, {0xdf, 0}, {0x5f, -15}, {0x9f, -15}, {0x1f, 0}};
   for (const auto& [flag, result] : cases) {
@@ -78,7 +79,7 @@ TEST(X509Extensions, TrueOfAnotherByteIsReadAsAnIdentifier) {
   }
 }
 
-// The two bytes, and the OCTET STRING, would read as a header of the private class and its value.
+// The two bytes and the OCTET STRING would read as a header of the private class and its value.
 TEST(X509Extensions, FlagOfTwoBytesOnAnUnderstoodExtensionIsMinus15) {
   const Bytes rest = FromHex("04 03 02 05 a0");
   EXPECT_EQ(ResultOf(With({RawExtension(kKeyUsage, Concat({FromHex("01 01 04"), rest}))})), 0);
@@ -95,8 +96,8 @@ TEST(X509Extensions, FlagOfAnyByteButZeroIsCriticalOnAnUnknownOid) {
 }
 
 TEST(X509Extensions, HeaderAfterTheFlagStartsAtTheFlagItself) {
-  // The flag 04 and the OCTET STRING 04 03 02 05 a0 read as an OCTET STRING of four bytes, which
-  // are 03 02 05 a0: a BIT STRING whose first and third bits are set.
+  // The flag 04 and the OCTET STRING 04 03 02 05 a0 read as an OCTET STRING of the four bytes 03 02
+  // 05 a0: a BIT STRING whose first and third bits are set.
   const ParsedCertificate parsed(
       With({RawExtension(kKeyUsage, Concat({der::Boolean(4), FromHex("04 03 02 05 a0")}))}));
   EXPECT_EQ(parsed.result, 0);
@@ -107,14 +108,14 @@ TEST(X509Extensions, MalformedExtensionIsMinus15) {
   const Bytes value = der::OctetString(DigitalSignature());
   const Bytes cases[] = {
       der::Set({}),                                                     // no SEQUENCE
-      {0x30, 0x05},                                                     // runs past the end
+      {0x30, 0x05},                                                     // ends beyond its container
       der::Context(16, {}),                                             // another class
       der::Sequence({}),                                                // no OID
       der::Sequence({value, value}),                                    // no OID either
       RawExtension(kUnknown, {}),                                       // no value
       RawExtension(kUnknown, der::Null()),                              // another element
       RawExtension(kUnknown, der::ContextPrimitive(4, {})),             // of another class
-      RawExtension(kUnknown, Concat({FromHex("01 00"), value})),        // a flag of no byte
+      RawExtension(kUnknown, Concat({FromHex("01 00"), value})),        // an empty flag
       RawExtension(kUnknown, Concat({FromHex("01 02 ff ff"), value})),  // of two bytes
       RawExtension(kUnknown, der::Boolean(0xff)),                       // no value after it
       RawExtension(kKeyUsage, Concat({der::Boolean(0xff), der::Null()})),
@@ -210,8 +211,8 @@ TEST(X509BasicConstraints, PathLengthMayStandAlone) {
 }
 
 TEST(X509BasicConstraints, MalformedIsMinus15) {
-  // Nothing; another element or class; a first element that is unreadable, neither flag nor number,
-  // of another class, or a flag of two bytes; a second one of the same kinds.
+  // No element; another element or class; a first element that is unreadable, neither flag nor
+  // number, of another class, or a flag of two bytes; a second element with one of the same faults.
   for (const char* digits :
        {"", "31 00", "b0 00", "30 01 01", "30 02 05 00", "30 03 81 01 ff", "30 03 82 01 01",
         "30 04 01 02 ff ff", "30 02 01 00", "30 04 01 01 ff 02", "30 05 01 01 ff 05 00",

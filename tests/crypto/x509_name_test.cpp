@@ -1,4 +1,4 @@
-// Names and times of a certificate.
+// The names and times of a certificate.
 #include <gtest/gtest.h>
 
 #include "crypto/parsed_certificate.h"
@@ -14,7 +14,7 @@ Certificate WithSubject(const Bytes& subject) {
   return certificate;
 }
 
-// A RelativeDistinguishedName of one attribute.
+// A RelativeDistinguishedName with one attribute.
 Bytes Rdn(const std::string& oid, const Bytes& value) {
   return der::Set({der::Sequence({der::Oid(oid), value})});
 }
@@ -87,7 +87,7 @@ TEST(X509Name, OtherAttributesAreSkipped) {
   EXPECT_EQ(parsed.cert.subject.email, nullptr);
 }
 
-TEST(X509Name, EmailAddressIsNoEntry) {
+TEST(X509Name, EmailAddressIsNotAnEntry) {
   const ParsedCertificate parsed(
       WithSubject(Name({{kEmailAddress, "first"}, {kEmailAddress, "a@example.com"}})));
   ASSERT_EQ(parsed.result, 0);
@@ -144,7 +144,7 @@ TEST(X509Name, ATwentyFirstKnownAttributeIsMinus12) {
   EXPECT_EQ(parsed.cert.subject.attribute_count, 0u);
 }
 
-TEST(X509Name, AnUnknownOrEmailAttributeAfterTwentyIsNoFailure) {
+TEST(X509Name, AnUnknownOrEmailAttributeAfterTwentyIsAccepted) {
   std::vector<std::pair<std::string, std::string>> attributes(20, {kCommonName, "x"});
   attributes.emplace_back("2.5.4.5", "x");
   attributes.emplace_back(kEmailAddress, "a@example.com");
@@ -191,7 +191,7 @@ TEST(X509Name, MalformedNameIsMinus12) {
   }
 }
 
-TEST(X509Name, FailureClearsTheWholeNameAndNoOther) {
+TEST(X509Name, FailureClearsTheWholeNameAndNotTheOther) {
   const ParsedCertificate parsed(WithSubject(
       der::Sequence({Rdn(kCommonName, FromHex("0c 01 61")), Rdn(kEmailAddress, FromHex("0c 01 62")),
                      Rdn(kCommonName, FromHex("0c 01 00"))})));

@@ -12,7 +12,7 @@ namespace {
 constexpr char kEcPublicKey[] = "1.2.840.10045.2.1";
 constexpr char kPrime256v1[] = "1.2.840.10045.3.1.7";
 
-// A certificate with something in every field, for the tests that damage one.
+// A certificate with a value in every field, for the tests that damage one.
 Certificate Full() {
   Certificate certificate = Unsigned();
   certificate.issuer =
@@ -28,7 +28,7 @@ Certificate Full() {
   return certificate;
 }
 
-// Whether a field of the record is absent, or lies in `bytes`.
+// True if a field of the record is empty or lies in `bytes`.
 bool Inside(const GuardedBytes& bytes, const uint8_t* value, uint64_t length) {
   if (value == nullptr) return length == 0;
   const uint8_t* end = bytes.data() + bytes.size();
@@ -86,14 +86,14 @@ TEST(X509CertificateParse, PublicKeyIsTheBitStringAfterTheCountOfUnusedBits) {
   OPENSSL_free(expected);
 }
 
-TEST(X509CertificateParse, WhatFollowsTheCertificateIsNotItsOwn) {
+TEST(X509CertificateParse, BytesAfterTheCertificateAreNotPartOfIt) {
   const Bytes der = Unsigned().Build();
   const ParsedCertificate parsed(Concat({der, Bytes(50, 0xff)}));
   EXPECT_EQ(parsed.result, 0);
   EXPECT_EQ(parsed.cert.cert_length, der.size());
 }
 
-TEST(X509CertificateParse, NothingGivenIsMinus2) {
+TEST(X509CertificateParse, MissingArgumentsAreMinus2) {
   const Bytes der = Unsigned().Build();
   x509_certificate cert;
   EXPECT_EQ(x509_certificate_parse(nullptr, der.size(), &cert), -2);
@@ -102,7 +102,7 @@ TEST(X509CertificateParse, NothingGivenIsMinus2) {
   EXPECT_EQ(x509_certificate_parse(der.data(), der.size(), &cert), 0);
 }
 
-TEST(X509CertificateParse, CertificateThatIsNoSequenceIsMinus3) {
+TEST(X509CertificateParse, CertificateThatIsNotASequenceIsMinus3) {
   EXPECT_EQ(ResultOf(der::Set({})), -3);
   EXPECT_EQ(ResultOf(Bytes{0x30}), -3);
   EXPECT_EQ(ResultOf(der::Context(16, {})), -3);
@@ -118,7 +118,7 @@ TEST(X509CertificateParse, CertificateThatRunsPastTheEndIsMinus3AndKeepsTheGiven
   EXPECT_EQ(parsed.cert.tbs_start, nullptr);
 }
 
-TEST(X509CertificateParse, TbsCertificateThatIsNoSequenceIsMinus3) {
+TEST(X509CertificateParse, TbsCertificateThatIsNotASequenceIsMinus3) {
   EXPECT_EQ(ResultOf(der::Sequence({})), -3);
   EXPECT_EQ(ResultOf(der::Sequence({der::Set({})})), -3);
   Certificate certificate = Unsigned();
@@ -270,7 +270,8 @@ TEST(X509Algorithm, ParametersOfAnotherKindAreLeftEmpty) {
 }
 
 TEST(X509Algorithm, MalformedSignatureAlgorithmIsMinus11) {
-  // No SEQUENCE, of another class, empty, without an OID, longer than what holds it.
+  // No SEQUENCE, another class, an empty one, one without an OID, one that ends beyond its
+  // container.
   for (const char* digits :
        {"31 00", "70 03 06 01 2a", "30 00", "30 02 05 00", "30 84 7f ff ff ff"}) {
     Certificate certificate = Unsigned();
@@ -369,7 +370,7 @@ TEST(X509OptionalFields, AnotherClassIsMinus5) {
   EXPECT_EQ(ResultOf(certificate), -5);
 }
 
-TEST(X509OptionalFields, WhatFollowsTheExtensionsIsIgnored) {
+TEST(X509OptionalFields, BytesAfterTheExtensionsAreIgnored) {
   Certificate certificate = Full();
   certificate.tbs_tail = {0xff};
   const ParsedCertificate parsed(certificate);
@@ -419,7 +420,7 @@ TEST(X509Bounds, EveryTruncationOfTheTbsCertificateIsReadNoFurther) {
   for (size_t length = header; length <= tbs.size(); ++length) {
     certificate.tbs =
         der::Sequence({Bytes(tbs.begin() + header, tbs.begin() + static_cast<ptrdiff_t>(length))});
-    // Alone in its buffer, so that the end of the tbsCertificate is the end of the bytes.
+    // The bytes end with the tbsCertificate.
     const ParsedCertificate parsed(der::Sequence({*certificate.tbs}));
     EXPECT_LT(parsed.result, 0) << length;
     EXPECT_TRUE(Inside(parsed.bytes, parsed.cert)) << length;

@@ -1,15 +1,14 @@
-// A library to be loaded before all others: makes one call of one C library function fail, counted
-// from the moment when main() starts.
+// A library to be loaded before all others. It makes one call of one C library function fail,
+// counted from the start of main().
 //
 //   APKTOOLKIT_FAULT         the function's name, ":", and the number of its call, from 1
-//   APKTOOLKIT_FAULT_REPORT  a file that is made when that call comes
+//   APKTOOLKIT_FAULT_REPORT  a file that is made at that call
 //
-// Calls from the simulated phone's own libraries are passed on and not counted, those for memory
-// excepted.
+// Calls from the simulated phone's own libraries are passed on and not counted, except for memory.
 //
 // The names are malloc, open, read, fopen, readlink, fgetxattr, fstatvfs and fcntl. A function
-// under several names (open, open64 and the checked __open_2) counts as one, as do malloc, calloc
-// and realloc.
+// under several names (open, open64 and the checked __open_2) counts as one, and so do malloc,
+// calloc and realloc.
 #include <dlfcn.h>
 #include <fcntl.h>
 #include <signal.h>
@@ -38,18 +37,18 @@ void* __libc_realloc(void* block, size_t size);
 namespace {
 
 char function[32];
-long calls_left = -1;  // until the one that fails; below 0: none will
+long calls_left = -1;  // until the one that fails; below 0: none fails
 const char* report = nullptr;
 
-// Whether the code at `address` is part of the shared library whose path holds `name`.
+// True if the code at `address` is part of the shared library whose path contains `name`.
 bool IsIn(const char* name, const void* address) {
   Dl_info info;
   return dladdr(address, &info) != 0 && info.dli_fname != nullptr &&
          strstr(info.dli_fname, name) != nullptr;
 }
 
-// The platform's String8 takes its memory for granted and runs into a null pointer where its other
-// containers abort. It is made to abort as well, so that no other crash can hide behind it.
+// Without memory, the platform's String8 uses a null pointer where its other containers abort. Here
+// it aborts, too, so that no other crash can look like this one.
 void AbortForString8(int, siginfo_t*, void* context) {
 #ifdef __x86_64__
   const auto address = static_cast<ucontext_t*>(context)->uc_mcontext.gregs[REG_RIP];
@@ -74,7 +73,7 @@ void Arm() {
   sigaction(SIGSEGV, &action, nullptr);
 }
 
-// Whether this call of the function is the one. Calls no function that could fail itself.
+// True if this is the call that must fail. Calls no function that could fail itself.
 bool Fails(const char* name, int error, const void* caller = nullptr) {
   if (calls_left <= 0 || strcmp(name, function) != 0) return false;
   if (caller != nullptr && IsIn("/lib/apktoolkit/", caller)) return false;
@@ -91,7 +90,7 @@ Main* real_main = nullptr;
 int ArmAndStart(int argc, char** argv, char** environment) {
   Arm();
   const int status = real_main(argc, argv, environment);
-  calls_left = 0;  // what is called from here on is not the tool's
+  calls_left = 0;  // later calls are not the tool's
   return status;
 }
 
@@ -156,7 +155,7 @@ extern "C" FILE* fopen64(const char* path, const char* mode) {
   return Fails("fopen", EMFILE, __builtin_return_address(0)) ? nullptr : next(path, mode);
 }
 
-// The mode is read even where none is given: it then is not looked at.
+// Reads a mode even if the caller passed none. It is then not used.
 extern "C" int open(const char* path, int flags, ...) {
   static auto* const next = NextFunction<int(const char*, int, ...)>("open");
   va_list arguments;

@@ -1,5 +1,5 @@
-// Whatever fails under the tool, and at whatever moment: it ends in order, or in the abort of a
-// container that finds no memory, and nothing is signed that had not been verified.
+// Makes each call under the tool fail, at each moment. The tool must end normally, or by the abort
+// of a container without memory. It must never get anything signed that was not verified.
 #include <fcntl.h>
 #include <gtest/gtest.h>
 #include <signal.h>
@@ -23,7 +23,7 @@ using namespace simulator;
 
 namespace {
 
-// Standard error goes to a file while this lives: an abort says its last words there, hundreds of
+// Sends standard error to a file while it lives. An abort prints its message there, hundreds of
 // times in a sweep.
 class KeptStandardError {
  public:
@@ -43,12 +43,12 @@ class KeptStandardError {
   const int saved_;
 };
 
-// A file installed in a folder of its own, and the phone that it is installed on.
+// A file installed in its own directory, and the phone that it is installed on.
 class Installed {
  public:
   explicit Installed(const Package& package, bool is_trusted = false) {
-    file_ = folder_.Write("app/base.apk", package.Build());
-    folder_.Write("app/lib/arm64/libfoo.so", ToBytes("\177ELF foo"));
+    file_ = directory_.Write("app/base.apk", package.Build());
+    directory_.Write("app/lib/arm64/libfoo.so", ToBytes("\177ELF foo"));
     struct stat state = {};
     if (is_trusted && stat(file_.c_str(), &state) == 0) {
       phone_.trusted = {{state.st_dev, state.st_ino}};
@@ -57,31 +57,31 @@ class Installed {
 
   struct Outcome {
     ToolEnd ending;
-    bool failed;  // the call that was to fail was made
-    // What was granted, a letter each, in their order: the library, the package and its key (N:
-    // under an empty name); a JAR.
+    bool failed;  // the call that must fail was made
+    // The grants, in order, one letter each: L the library, P the package, K its key (N: under an
+    // empty name), J a JAR.
     std::string grants;
     std::string errors;
   };
 
   // Runs the tool with the fault, such as "open:1".
   Outcome Run(const std::string& fault) {
-    std::filesystem::remove(folder_ / "report");
-    std::filesystem::remove(folder_ / "journal");
-    phone_.journal = folder_ / "journal";
+    std::filesystem::remove(directory_ / "report");
+    std::filesystem::remove(directory_ / "journal");
+    phone_.journal = directory_ / "journal";
     ToolCommand command = {
         {}, TOOL_PATH, file_, FAULT_INJECTOR ":" KERNEL_STAND_IN, SettingsToEnvironment(phone_)};
     if (AreProgramsEmulated()) command.runner = Split(APKTOOLKIT_RUNNER, ' ');
     command.environment.push_back("APKTOOLKIT_FAULT=" + fault);
-    command.environment.push_back("APKTOOLKIT_FAULT_REPORT=" + folder_ / "report");
+    command.environment.push_back("APKTOOLKIT_FAULT_REPORT=" + directory_ / "report");
     Outcome outcome;
     {
-      const KeptStandardError kept(folder_ / "errors");
+      const KeptStandardError kept(directory_ / "errors");
       outcome.ending = RunTool(command, Deadline(20));
     }
-    outcome.failed = std::filesystem::exists(folder_ / "report");
+    outcome.failed = std::filesystem::exists(directory_ / "report");
     outcome.grants = Grants(ContentOf(phone_.journal), file_);
-    outcome.errors = ContentOf(folder_ / "errors");
+    outcome.errors = ContentOf(directory_ / "errors");
     return outcome;
   }
 
@@ -109,7 +109,7 @@ class Installed {
     return payload == "0000" && !is_library ? "J" : "?";
   }
 
-  TempDir folder_;
+  TempDir directory_;
   PhoneSettings phone_;
   std::string file_;
 };
@@ -118,12 +118,12 @@ bool IsExit0(const ToolEnd& ending) {
   return ending.how == ToolEnd::How::kExited && ending.value == 0;
 }
 
-// What must come of a run in which the first call of the function fails, the second, and so on.
+// The expected grants of runs in which the function's first call fails, its second, and so on.
 using Runs = std::vector<std::string>;
 using Table = std::map<std::string, Runs>;
 
-// Makes each call of the functions fail, one in a run, and one in the last run of each that is not
-// made. What a run without a fault grants is `all`.
+// Makes each call of the functions fail, one per run. In a last run for each function, the call
+// that must fail is never made. `all` are the grants of a run without a fault.
 void ExpectRuns(Installed& file, const std::string& all, const Table& table) {
   for (const auto& [function, runs] : table) {
     for (size_t call = 1; call <= runs.size() + 1; ++call) {
@@ -157,19 +157,19 @@ Installed PackageWithAnotherLibrary() {
   return Installed(MakePackage(options));
 }
 
-TEST(FaultsOfCalls, CostAGoodPackageWhatTheyAreFor) {
+TEST(FaultsOfCalls, OnAGoodPackageCostTheirOwnStep) {
   Installed file = GoodPackage();
   ExpectRuns(file, "LPK",
              {{"open", {"", "PK", "PK"}},     // the package; the library to read it, to sign it
               {"read", {"PK"}},               // the library
               {"fopen", {"PK", "LK"}},        // the own integrity value, before each signing
-              {"fcntl", {"PK", "PK", "LK"}},  // the library kept open; the signings
-              {"readlink", {"PK", "LPK"}},    // the libraries' folder; a message
+              {"fcntl", {"PK", "PK", "LK"}},  // the library kept open; both signings
+              {"readlink", {"PK", "LPK"}},    // the libraries' directory; a message
               {"fstatvfs", {"LPK"}},          // a file system that counts as writable
-              {"fgetxattr", {}}});            // JARs alone have attributes
+              {"fgetxattr", {}}});            // only JARs have attributes
 }
 
-TEST(FaultsOfCalls, CostATrustedJarWhatTheyAreFor) {
+TEST(FaultsOfCalls, OnATrustedJarCostTheirOwnStep) {
   Installed file = TrustedJar();
   ExpectRuns(file, "J",
              {{"open", {""}},
@@ -181,7 +181,7 @@ TEST(FaultsOfCalls, CostATrustedJarWhatTheyAreFor) {
               {"fgetxattr", {"J"}}});
 }
 
-TEST(FaultsOfCalls, GetNothingSignedForAPackageThatIsNotGood) {
+TEST(FaultsOfCalls, OnABadPackageGetNothingSigned) {
   Installed file = PackageWithABadDex();
   ExpectRuns(file, "",
              {{"open", {""}},
@@ -193,7 +193,7 @@ TEST(FaultsOfCalls, GetNothingSignedForAPackageThatIsNotGood) {
               {"fgetxattr", {}}});
 }
 
-TEST(FaultsOfCalls, GetNoLibrarySignedThatIsNotTheManifests) {
+TEST(FaultsOfCalls, OnAnotherLibraryDoNotGetItSigned) {
   Installed file = PackageWithAnotherLibrary();
   ExpectRuns(file, "P",
              {{"open", {"", "P"}},
@@ -213,16 +213,17 @@ TEST(FaultsOfCalls, GetNoLibrarySignedThatIsNotTheManifests) {
 #define HAS_OWN_MALLOC false
 #endif
 
-// The memory of the sanitizer is its own and does not fail.
+// The sanitizer has its own memory, which does not fail.
 #if !HAS_OWN_MALLOC
 
 bool IsAbort(const ToolEnd& ending) {
   return ending.how == ToolEnd::How::kKilled && ending.value == SIGABRT;
 }
 
-// Makes each request for memory fail, one in a run. A run ends in the abort of a container, and
-// then keeps what was granted before, which is never less than with an earlier request; or it ends
-// in order, in one of the ways given: what the tool and the libraries under it make of the lack.
+// Makes each request for memory fail, one per run. A run may end by the abort of a container. It
+// then keeps the earlier grants, which are never fewer than with an earlier request. Otherwise it
+// ends normally, with one of the given grants: the tool and its libraries cope with the missing
+// memory.
 void ExpectRunsWithoutMemory(Installed& file, const std::string& all,
                              const std::set<std::string>& ways) {
   constexpr int kMostCalls = 20000;
@@ -247,24 +248,25 @@ void ExpectRunsWithoutMemory(Installed& file, const std::string& all,
   FAIL() << "memory is asked for without end";
 }
 
-TEST(FaultsOfMemory, CostAGoodPackageWhatComesAfter) {
+TEST(FaultsOfMemory, OnAGoodPackageCostTheLaterSteps) {
   Installed file = GoodPackage();
   // Nothing verified; no stream for the integrity value, before either signing; no text for the
-  // permission, or for the package's name, which then read as empty; a lack that is made up for.
+  // permission or for the package's name, which then reads as empty; a request whose failure does
+  // not matter.
   ExpectRunsWithoutMemory(file, "LPK", {"", "PK", "LK", "LP", "LPN", "LPK"});
 }
 
-TEST(FaultsOfMemory, CostATrustedJarWhatComesAfter) {
+TEST(FaultsOfMemory, OnATrustedJarCostTheLaterSteps) {
   Installed file = TrustedJar();
   ExpectRunsWithoutMemory(file, "J", {"", "J"});
 }
 
-TEST(FaultsOfMemory, GetNothingSignedForAPackageThatIsNotGood) {
+TEST(FaultsOfMemory, OnABadPackageGetNothingSigned) {
   Installed file = PackageWithABadDex();
   ExpectRunsWithoutMemory(file, "", {""});
 }
 
-TEST(FaultsOfMemory, GetNoLibrarySignedThatIsNotTheManifests) {
+TEST(FaultsOfMemory, OnAnotherLibraryDoNotGetItSigned) {
   Installed file = PackageWithAnotherLibrary();
   ExpectRunsWithoutMemory(file, "P", {"", "P"});
 }

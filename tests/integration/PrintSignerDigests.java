@@ -7,9 +7,9 @@ import java.security.cert.X509Certificate;
 import java.util.List;
 
 /**
- * PrintSignerDigests LEVEL FILE [JAR-SIGNER]: prints what SignerDigests makes of the signers that the
- * package manager of this API level has for the package; or, with a third word, whether that is one
- * of them. Fails where the package manager would refuse the package.
+ * PrintSignerDigests LEVEL FILE [JAR-SIGNER]: prints the SignerDigests of the signers that the package
+ * manager of this API level finds for the package; with a third word, prints whether that word is one
+ * of them. Fails if the package manager would refuse the package.
  */
 public final class PrintSignerDigests {
     public static void main(String[] words) throws Exception {

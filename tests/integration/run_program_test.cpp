@@ -16,18 +16,18 @@
 
 namespace {
 
-// A shell that runs `script`; what it prints goes to the file $0.
+// A shell that runs `script`. Its output goes to the file $0.
 RunResult Shell(const std::string& script, const std::string& file = "/dev/null",
                 const RunLimits& limits = {}) {
   return RunProgram({"/bin/sh", "-c", "exec >\"$0\"; " + script, file}, limits);
 }
 
-// What the script prints.
+// The script's output.
 std::string Printed(const std::string& script, const RunLimits& limits = {}) {
-  const TempDir folder;
-  const RunResult run = Shell(script, folder / "output", limits);
+  const TempDir directory;
+  const RunResult run = Shell(script, directory / "output", limits);
   EXPECT_EQ(run.end, RunEnd::kExited);
-  return ContentOf(folder / "output");
+  return ContentOf(directory / "output");
 }
 
 void Expect(const RunResult& run, RunEnd end, int value) {
@@ -43,8 +43,8 @@ TEST(RunProgram, TellsTheExitStatus) {
 
 TEST(RunProgram, HandsOverEachArgument) {
   EXPECT_EQ(Printed("echo \"$#\""), "0\n");
-  const TempDir folder;
-  const std::string file = folder / "output";
+  const TempDir directory;
+  const std::string file = directory / "output";
   RunProgram({"/bin/sh", "-c", "printf '%s|' \"$@\" >\"$0\"", file, "a b", "", "*"}, {});
   EXPECT_EQ(ContentOf(file), "a b||*|");
 }
@@ -54,7 +54,7 @@ TEST(RunProgram, TellsTheSignal) {
   Expect(Shell("kill -KILL $$"), RunEnd::kKilled, SIGKILL);
 }
 
-TEST(RunProgram, KillsWhatTakesTooLong) {
+TEST(RunProgram, KillsAProgramThatTakesTooLong) {
   RunLimits limits;
   limits.milliseconds = 200;
   const auto start = std::chrono::steady_clock::now();
@@ -65,21 +65,21 @@ TEST(RunProgram, KillsWhatTakesTooLong) {
   EXPECT_EQ(waitpid(-1, nullptr, WNOHANG), -1);  // it is gone
 }
 
-TEST(RunProgram, LeavesWhatEndsInTimeAlone) {
+TEST(RunProgram, LeavesAProgramThatEndsInTimeAlone) {
   RunLimits limits;
   limits.milliseconds = 20000;
   Expect(RunProgram({"/bin/sleep", "0.3"}, limits), RunEnd::kExited, 0);
 }
 
-TEST(RunProgram, ThatIsNotThereIsNotStarted) {
+TEST(RunProgram, ThatIsMissingIsNotStarted) {
   Expect(RunProgram({"/nowhere/apktoolkit"}, {}), RunEnd::kNotStarted, 0);
   Expect(RunProgram({"/dev/null"}, {}), RunEnd::kNotStarted, 0);
 }
 
-// What the standard streams of a shell are, before it redirects anything.
+// The standard streams of a shell before it redirects any.
 std::string Streams() {
-  const TempDir folder;
-  const std::string file = folder / "output";
+  const TempDir directory;
+  const std::string file = directory / "output";
   const char script[] =
       "streams=$(readlink /proc/$$/fd/0 /proc/$$/fd/1 /proc/$$/fd/2); echo \"$streams\" >\"$0\"";
   RunProgram({"/bin/sh", "-c", script, file}, {});
@@ -93,8 +93,8 @@ TEST(RunProgram, HasNullForItsStreamsAndNothingElseOpen) {
   close(inherited);
 }
 
-// A daemon may have no streams of its own.
-TEST(RunProgram, HasItsStreamsThoughThisProcessHasNone) {
+// A daemon may not have standard streams.
+TEST(RunProgram, HasItsStreamsEvenIfThisProcessHasNone) {
   std::string streams;
   {
     const FreeDescriptor input(STDIN_FILENO), output(STDOUT_FILENO), errors(STDERR_FILENO);
@@ -103,14 +103,14 @@ TEST(RunProgram, HasItsStreamsThoughThisProcessHasNone) {
   EXPECT_EQ(streams, "/dev/null\n/dev/null\n/dev/null\n");
 }
 
-// A shell would unblock them itself.
+// A shell would unblock signals itself.
 TEST(RunProgram, HasNoSignalBlocked) {
   sigset_t some, before;
   sigemptyset(&some);
   sigaddset(&some, SIGTERM);
   pthread_sigmask(SIG_BLOCK, &some, &before);
-  const TempDir folder;
-  const std::string file = folder / "status";
+  const TempDir directory;
+  const std::string file = directory / "status";
   RunProgram({"/bin/cp", "/proc/self/status", file}, {});
   pthread_sigmask(SIG_SETMASK, &before, nullptr);
   EXPECT_NE(ContentOf(file).find("\nSigBlk:\t0000000000000000\n"), std::string::npos);
@@ -139,8 +139,8 @@ TEST(RunProgram, WithoutDescriptorsIsNotStarted) {
   Expect(run, RunEnd::kNotStarted, EMFILE);
 }
 
-// Where SIGCHLD is ignored the kernel throws the status away.
-TEST(RunProgram, WhoseStatusSomebodyElseTookIsLost) {
+// While SIGCHLD is ignored, the kernel drops the status.
+TEST(RunProgram, WhoseStatusAnotherCallTookIsLost) {
   const auto before = signal(SIGCHLD, SIG_IGN);
   Expect(RunProgram({"/bin/true"}, {}), RunEnd::kLost, ECHILD);
   signal(SIGCHLD, before);

@@ -1,4 +1,4 @@
-// The caller at work: real programs in the simulated phone, which remembers what was signed.
+// Runs the caller with real programs in the simulated phone, which remembers signed files.
 #include "integration/caller/sign_package.h"
 
 #include <gtest/gtest.h>
@@ -16,7 +16,7 @@ namespace fs = std::filesystem;
 
 std::string Golden(const std::string& name) { return std::string(GOLDEN_PACKAGES) + "/" + name; }
 
-// A phone: its programs, its packages, and what its kernel has signed.
+// A phone: its programs, its packages, and the files that its kernel has signed.
 class Phone : public testing::Test {
  protected:
   Phone() {
@@ -25,7 +25,7 @@ class Phone : public testing::Test {
     InstallProgram("apktoolkit-bound", std::string("exec '") + APKTOOLKIT_BOUND_PATH + "'");
   }
 
-  // A script in the place of a program, which hands on its arguments.
+  // Installs a script in place of a program. It passes on its arguments.
   void InstallProgram(const std::string& name, const std::string& command) const {
     const std::string path = bin_.Write(name, ToBytes("#!/bin/sh\n" + command + " \"$@\"\n"));
     ASSERT_EQ(chmod(path.c_str(), 0700), 0);
@@ -35,7 +35,7 @@ class Phone : public testing::Test {
     return "exec '" + SimulatorPath() + "' --state '" + (data_ / "signed") + "' " + options;
   }
 
-  // Installs a golden package; its signers are those of its key.
+  // Installs a golden package whose signers are those of its key.
   InstalledPackage Install(const std::string& name) const {
     fs::copy(Golden(name), data_ / name, fs::copy_options::recursive);
     return {data_ / (name + "/base.apk"), ContentOf(Golden(name) + "/digest").substr(0, 64)};
@@ -57,7 +57,7 @@ TEST_F(Phone, SignsAPackageOnce) {
   EXPECT_EQ(Sign(package), SignOutcome::kTrusted);
   EXPECT_TRUE(IsTrusted(package.path));
   EXPECT_TRUE(IsTrusted(fs::path(package.path).parent_path() / "lib/arm64/libvault.so"));
-  InstallProgram("apktoolkit", "exit 1");  // what was signed needs no run
+  InstallProgram("apktoolkit", "exit 1");  // signed packages need no run
   EXPECT_EQ(Sign(package), SignOutcome::kTrustedAlready);
 }
 
@@ -75,19 +75,19 @@ TEST_F(Phone, LeavesAPackageWithoutAJarSignatureAlone) {
   EXPECT_FALSE(IsTrusted(package.path));
 }
 
-// The signature file's signature holds, and the dex does not match.
-TEST_F(Phone, DoesNotTrustWhatTheToolRefuses) {
+// The signature file's signature is good, but the dex does not match.
+TEST_F(Phone, DoesNotTrustAPackageThatTheToolRefuses) {
   const InstalledPackage package = Install("changed-dex");
   EXPECT_EQ(Sign(package), SignOutcome::kNotTrusted);
   EXPECT_FALSE(IsTrusted(package.path));
 }
 
-TEST_F(Phone, DoesNotTrustWhatTheKernelRefuses) {
+TEST_F(Phone, DoesNotTrustAPackageThatTheKernelRefuses) {
   InstallProgram("apktoolkit", Simulator("--sign-errno EPERM"));
   EXPECT_EQ(Sign(Install("apksigner-sha256-2048")), SignOutcome::kNotTrusted);
 }
 
-// As where the kernel's integrity value never settles.
+// Simulates a kernel whose integrity value never settles.
 TEST_F(Phone, EndsARunThatTakesTooLong) {
   InstallProgram("apktoolkit", "exec sleep 60 #");
   RunLimits limits;
@@ -130,7 +130,7 @@ TEST_F(AfterAnUpdate, EveryPackageIsSignedAndToldOf) {
   EXPECT_EQ(run.errors, "");
   EXPECT_EQ(run.status, 0);
 
-  // Again, as after a run that was cut off.
+  // Runs again, as after an interrupted run.
   run = SignAll(Line(first) + Line(second));
   EXPECT_EQ(run.output, first.path + ": trusted already\n" + second.path + ": trusted already\n");
   EXPECT_EQ(run.status, 0);

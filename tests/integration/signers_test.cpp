@@ -1,5 +1,5 @@
-// Binding the signers, on both sides: who signed, in the words of the package manager, and whether
-// apktoolkit goes by the same.
+// Binding the signers, on both sides: the package manager's signers, and whether apktoolkit finds
+// the same ones.
 #include <gtest/gtest.h>
 
 #include <filesystem>
@@ -37,7 +37,7 @@ std::string SignersOf(const std::string& apk, int level = 33) {
   return run.output.substr(0, run.output.find('\n'));
 }
 
-// The C++ side. The command that it may run tells that it ran.
+// The C++ side. The command prints that it ran.
 ProcessResult Bound(const std::string& digests, const std::string& file) {
   return RunProcess({APKTOOLKIT_BOUND_PATH, digests, "/bin/echo", "run for", file});
 }
@@ -59,15 +59,16 @@ constexpr int kOtherSigner = 3;
 constexpr int kNoJarSigner = 4;
 constexpr int kNotStarted = 5;
 
-// A package whose signers differ: another's META-INF, dex and libraries below one's own block.
+// A package with two different signers: the META-INF, dex and libraries are another's, below the
+// attacker's own signing block.
 class PackageWithTwoFaces : public testing::Test {
  protected:
-  PackageWithTwoFaces() : apk_(folder_ / "base.apk") {
+  PackageWithTwoFaces() : apk_(directory_ / "base.apk") {
     const std::string victims = std::string(THREAT_PACKAGES) + "/foreign/base.apk";
     WriteFile(apk_, AddSigningBlock(ToBytes(ContentOf(victims)), "rsa-2048-other"));
   }
 
-  TempDir folder_;
+  TempDir directory_;
   const std::string apk_;
 };
 
@@ -112,7 +113,7 @@ INSTANTIATE_TEST_SUITE_P(Of, OneSigner,
                            return name;
                          });
 
-// The tool goes by the first signature file, the package manager by all signers of the block.
+// The tool uses the first signature file, the package manager all signers of the block.
 TEST(Signers, OneOfSeveralIsEnough) {
   const std::string apk = Golden("two-signers/base.apk");
   const std::string digests = SignersOf(apk, 27);
@@ -122,18 +123,18 @@ TEST(Signers, OneOfSeveralIsEnough) {
   ExpectRun(DigestOfKey("openssl-cms-issued") + "," + DigestOfKey("apksigner-sha256-2048"), apk);
 }
 
-// From API level 28 on the package manager goes by the new key, the JAR signature is the old key's.
-TEST(Signers, RetiredKeyIsNoSigner) {
+// From API level 28 on the package manager uses the new key. The JAR signature is the old key's.
+TEST(Signers, RetiredKeyIsNotASigner) {
   const std::string apk = Golden("rotated-key/base.apk");
   EXPECT_EQ(SignersOf(apk, 33), DigestOfKey("openssl-cms-issued"));
   ExpectNotRun(kOtherSigner, SignersOf(apk, 33), apk);
   ExpectRun(SignersOf(apk, 27), apk);
 }
 
-// As the tool does it: the signer of a leased package is looked at once the holder gives it up.
+// As in the tool: the signer of a leased package is read once the holder gives it up.
 TEST(Signers, OfALeasedPackageAreWaitedFor) {
-  const TempDir folder;
-  const std::string apk = folder / "base.apk";
+  const TempDir directory;
+  const std::string apk = directory / "base.apk";
   fs::copy_file(Golden("apksigner-sha256-2048/base.apk"), apk);
   const Lease lease(apk);
   if (!lease.IsHeld()) GTEST_SKIP() << "the file system of " << apk << " knows no leases";
@@ -147,24 +148,24 @@ TEST(Signers, ThatAreNotRsaHaveNoDigest) {
   ExpectNotRun(kNoJarSigner, "", apk);
 }
 
-TEST(Signers, OfFilesWithoutAJarSignatureThatHoldsAreNone) {
-  const TempDir folder;
-  const std::string text = folder.Write("text", ToBytes("no archive"));
+TEST(Signers, OfFilesWithoutAGoodJarSignatureAreEmpty) {
+  const TempDir directory;
+  const std::string text = directory.Write("text", ToBytes("no archive"));
   PackageOptions jar;
   jar.android_manifest = Bytes();
-  MakePackage(jar).WriteTo(folder / "plain.jar");
+  MakePackage(jar).WriteTo(directory / "plain.jar");
   const std::string key = DigestOfKey("apksigner-sha256-2048");
   for (const std::string& file :
        {Golden("apksigner-newer-only/base.apk"), Golden("unsigned.apk"),
         Golden("jarsigner-sha256/base.apk"), Golden("openssl-cms-issued/base.apk"), text,
-        folder / "plain.jar", folder / "missing", folder.path()}) {
+        directory / "plain.jar", directory / "missing", directory.path()}) {
     ExpectNotRun(kNoJarSigner, key, file);
     ExpectNotRun(kNoJarSigner, "", file);
   }
 }
 
-// Only a whole digest counts, and no signer at all is no match.
-TEST(Signers, AreComparedWhole) {
+// Only a whole digest matches, and an empty list of signers never does.
+TEST(Signers, AreComparedAsWholeDigests) {
   const std::string apk = Golden("apksigner-sha256-2048/base.apk");
   const std::string key = DigestOfKey("apksigner-sha256-2048");
   for (const std::string& digests :
@@ -190,7 +191,7 @@ TEST(Bound, LeavesNothingOpenForTheCommand) {
   EXPECT_EQ(run.output, "0\n1\n2\n3\n");  // 3 is the listing's own
 }
 
-// The tool finds descriptor 3 free, as when it is started by itself, and signs.
+// Descriptor 3 is free, as when the tool is started directly, and the tool signs.
 TEST(Bound, HasTheToolSign) {
   const std::string apk = Golden("apksigner-sha256-2048/base.apk");
   const ProcessResult run = RunProcess({APKTOOLKIT_BOUND_PATH, DigestOfKey("apksigner-sha256-2048"),

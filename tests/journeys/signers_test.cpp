@@ -35,7 +35,8 @@ TEST_P(Signer, IsPrintedAsApksignerPrintsIt) {
   const ProcessResult judge =
       RunProcess({"env", "LC_ALL=C.UTF-8", "apksigner", "verify", "--print-certs", "-v", apk});
   ASSERT_EQ(judge.status, 0) << judge.errors;
-  const ProcessResult told = RunProcess({"env", "LC_ALL=C.UTF-8", SimulatorPath(), apk});
+  const ProcessResult told =
+      RunProcess({"env", "LC_ALL=C.UTF-8", SimulatorPath(), "--installer=off", apk});
 
   const Lines expected = Labelled(judge.output);
   ASSERT_EQ(expected.size(), 5U) << judge.output;
@@ -52,7 +53,7 @@ INSTANTIATE_TEST_SUITE_P(Of, Signer,
                          });
 
 std::string Told(const std::string& name, const Lines& options = {}) {
-  Lines command = {"env", "LC_ALL=C.UTF-8", SimulatorPath()};
+  Lines command = {"env", "LC_ALL=C.UTF-8", SimulatorPath(), "--installer=off"};
   command.insert(command.end(), options.begin(), options.end());
   command.push_back(Golden(name) + "/base.apk");
   return RunProcess(command).output;

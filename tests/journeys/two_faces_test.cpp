@@ -119,7 +119,8 @@ struct Told {
     const TempDir folder;
     WriteFile(folder / "base.apk", archive);
     const auto run = [&](std::vector<std::string> words) {
-      words.insert(words.begin(), {"env", "LC_ALL=C.UTF-8", SimulatorPath()});
+      words.insert(words.begin(),
+                   {"env", "LC_ALL=C.UTF-8", SimulatorPath(), "--installer=off", "--install=no"});
       words.insert(words.end(), options.begin(), options.end());
       words.emplace_back("base.apk");
       return RunProcess(words, folder.path());

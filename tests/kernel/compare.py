@@ -1,12 +1,12 @@
 #!/usr/bin/env python3
-"""compare.py FILES EXPECTED KERNEL...: holds what programs did on real kernels against what they did in
-the simulated phone, and prints a table.
+"""compare.py FILES EXPECTED KERNEL...: compares runs of programs on real kernels with the same runs
+in the simulated phone, and prints a table.
 
-FILES has what they ran for, EXPECTED the simulator's journals, and each directory KERNEL `results`, as
-tests/kernel/init left them, and `disk.img`. Fails when anything differs: an event (log record, reading
-of the integrity value, what the kernel was asked with payload, result and errno, registration, exit
-status), its place among the others, a line of output; or when a signed file on the disk does not hold
-its payload, or the kernel complained.
+FILES has the files of the runs, EXPECTED the simulator's journals. Each directory KERNEL has
+`results`, as tests/kernel/init left them, and `disk.img`. Fails if anything differs: an event (log
+record, reading of the integrity value, call to the kernel with payload, result and errno,
+registration, exit status), its place in the order, or a line of output. Fails also if a signed file
+on the disk does not hold its payload, or if the kernel complained.
 """
 
 import difflib
@@ -21,19 +21,21 @@ import tempfile
 import runs
 
 PRIORITIES = {"V": 2, "D": 3, "I": 4, "W": 5, "E": 6, "F": 7}
-# How the workstation's liblog begins a record on standard error: tag, priority, date, time, two numbers.
+# The start of a record that the workstation's liblog writes to standard error: tag, priority, date,
+# time, two numbers.
 RECORD = re.compile(r"(\S+) ([VDIWEF]) \d\d-\d\d \d\d:\d\d:\d\d +\d+ +\d+ (.*)", re.S)
-# What only the simulator has to say; output is held apart, as it comes when the program ends.
+# Events that only the simulator has. Output is compared separately, as it comes when the program
+# ends.
 OF_SIMULATION = {"journal", "start", "attached", "verdict", "stdout"}
 SEEN_BY_MODULE = {"integrity", "sign", "verify"}
-INFORMATION = 4  # the workstation's liblog keeps records of a lower priority to itself
+INFORMATION = 4  # the workstation's liblog drops records of a lower priority
 COMPLAINT = re.compile(r"BUG:|WARNING:|Oops|Call [Tt]race|refcount_t|general protection|avc: +denied")
-# How a kernel with a policy tells that the installer's domain started a program of the tool's.
+# A kernel with a policy prints this when the installer's domain starts a program of the tool.
 ENTRY = re.compile(r"avc: +granted +{ transition } .* scontext=u:r:installd:s0 tcontext=u:r:apktoolkit:s0 ")
 
 
 class Kernel:
-    """What came from a kernel."""
+    """The results of one kernel."""
 
     def __init__(self, directory):
         self.name = directory.name
@@ -47,7 +49,7 @@ class Kernel:
         self.verdicts = {}  # "same" or "DIFFERS", by the name of the run
 
     def events(self, run):
-        """All but output: the events, with the log's records where they stand among them."""
+        """All events without the output. The log's records are in their places among them."""
         events = []
         for line in (self.results / f"{run.name}.journal").read_text().split("\n")[:-1]:
             record = RECORD.fullmatch(line)
@@ -57,7 +59,7 @@ class Kernel:
                 events.append({"event": "log", "priority": PRIORITIES[record[2]], "tag": record[1],
                                "text": record[3]})
             elif events and events[-1]["event"] == "log":
-                # The record ends in a line end of its own, or goes on after it.
+                # The record ends with a line end of its own, or continues after it.
                 events[-1]["text"] += "\n" + line
             else:
                 events.append({"event": "unknown", "text": line})
@@ -68,7 +70,7 @@ class Kernel:
 
 
 def simulated(expected, run):
-    """The events of the simulated phone but output, and the output."""
+    """The simulated phone's events without the output, and the output."""
     lines = (expected / f"{run.name}.journal").read_text().splitlines()
     events = [json.loads(line) for line in lines]
     output = "".join(event["text"] for event in events if event["event"] == "stdout")
@@ -91,7 +93,7 @@ def compare(kernel, expected, run):
 
 
 def probe_answers(kernel, files, run):
-    """What the calls of the probe returned, with errno."""
+    """The results of the probe's calls, with errno."""
     wanted = (files / f"{run.file}.out").read_text().splitlines()
     found = (kernel.results / f"{run.name}.out").read_text().splitlines()
     if found != wanted:
@@ -101,28 +103,29 @@ def probe_answers(kernel, files, run):
 
 
 def last_payloads(kernel, all_runs):
-    """The payload with which each file was signed last, by its path."""
+    """The payload that each file was last signed with, by its path."""
     return {event["path"]: bytes.fromhex(event["payload"])
             for run in all_runs for event in kernel.events(run)
             if event["event"] == "sign" and event["result"] == 0}
 
 
 def check_disk(kernel, files, all_runs):
-    """Each signed file keeps the digest of its bytes and its payload, as e2fsprogs read the disk."""
+    """Each signed file keeps the digest of its bytes and its payload, as e2fsprogs reads them from
+    disk."""
     payloads = last_payloads(kernel, all_runs)
     with tempfile.TemporaryDirectory() as name:
-        folder = pathlib.Path(name)
+        directory = pathlib.Path(name)
         commands = []
         for number, path in enumerate(payloads):
             inside = "/" + str(pathlib.Path(path).relative_to(files))
-            commands += [f"dump {inside} {folder}/{number}.bytes",
-                         f"ea_get -f {folder}/{number}.kept {inside} security.integrity_stand_in"]
-        (folder / "commands").write_text("\n".join(commands) + "\n")
-        subprocess.run(["debugfs", "-f", folder / "commands", kernel.disk], check=True,
+            commands += [f"dump {inside} {directory}/{number}.bytes",
+                         f"ea_get -f {directory}/{number}.kept {inside} security.integrity_stand_in"]
+        (directory / "commands").write_text("\n".join(commands) + "\n")
+        subprocess.run(["debugfs", "-f", directory / "commands", kernel.disk], check=True,
                        stdout=subprocess.DEVNULL, stderr=subprocess.DEVNULL)
         for number, (path, payload) in enumerate(payloads.items()):
-            digest = hashlib.sha256((folder / f"{number}.bytes").read_bytes()).digest()
-            kept = folder / f"{number}.kept"
+            digest = hashlib.sha256((directory / f"{number}.bytes").read_bytes()).digest()
+            kept = directory / f"{number}.kept"
             is_changed = path.endswith("/changed.jar")
             if not kept.exists() or kept.read_bytes()[32:] != payload:
                 kernel.problems.append(f"{path} does not keep its payload on the disk")
@@ -132,7 +135,7 @@ def check_disk(kernel, files, all_runs):
 
 
 def check_domain(kernel, all_runs):
-    """With a policy each run that is confined was one in the tool's domain."""
+    """With a policy, each confined run was in the tool's domain."""
     entered = sum(bool(ENTRY.search(line)) for line in kernel.messages)
     confined = sum(run.confined for run in all_runs)
     if kernel.has_policy and entered != confined:
@@ -140,7 +143,7 @@ def check_domain(kernel, all_runs):
 
 
 def summary(expected, run):
-    """What was asked of the phone, in few words."""
+    """A short text of the run's events."""
     events, _ = simulated(expected, run)
     answers = {}
     for event in events:

@@ -1,7 +1,7 @@
 #!/usr/bin/env python3
-"""What is run on the real kernel and in the simulated phone, for scripts/kernel.
+"""The runs on the real kernel and in the simulated phone, for scripts/kernel.
 
-runs.py files DIRECTORY GOLDEN           makes the files that the tool is run for
+runs.py files DIRECTORY GOLDEN           makes the files for the runs
 runs.py simulate DIRECTORY BUILD OUT     runs all in the simulated phone: OUT/NAME.journal and, for the
                                          guest, the same runs as a script: OUT/runs
 """
@@ -18,19 +18,19 @@ TOOL, VERIFY, PROBE = "apktoolkit", "apktoolkit-verify", "simulator_probe"
 
 GOOD = "golden/apksigner-sha256-2048"
 
-# What the probe does (tests/simulator/phone/probe.cpp): calls that the tool never makes, whose answers
-# the simulated kernel has to have in common with a real one.
+# The probe's calls (tests/simulator/phone/probe.cpp). The tool never makes them, but the simulated
+# kernel must answer them like a real one.
 PROBES = {
-    # Kernels trust the JARs of their own system; here they are signed first.
+    # Kernels trust the JARs of their own system. Here the probe signs them first.
     "trust": ["open jars/trusted.jar", "sign 5 0000", "open jars/trusted-marked.jar", "sign 6 0000",
               "open jars/changed.jar", "sign 7 0000", "open jars/refused.jar", "sign 8 0000",
               "verify 5"],
     "calls": ["verify 3", "sign 3 0200abcd", "verify 3", "sign64 3 0000", "verify64 3",
-              # as many bytes as the length says, and not one more
+              # exactly as many bytes as the length says
               "sign 3 0100abcdef", "sign 3 d007" + "5a" * 2000,
               # memory that cannot be read, or ends within the payload
               "sign 3 null", "sign 3 wild", "sign 3 cut",
-              # what is not open, or only named
+              # descriptors that are not open, or that only name a file
               "sign 700 0000", "sign -1 0000", "sign 700 null", "verify 700", "verify -1",
               "name .", "sign 5 0000", "verify 5",
               # the commands beside the feature's own
@@ -46,10 +46,10 @@ PROBES = {
 class Run:
     """A run of a program for one file, on a phone that these options of apktoolkit-sim describe.
 
-    before: a command of the shell that changes the files first, here and there.
-    feature: whether the kernel has it; mount: how the files are mounted.
-    confined: on a kernel with a policy it runs in the tool's domain. The policy is for regular files,
-    and the probe is no program of a product.
+    before: a shell command that first changes the files, on the phone and in the simulation.
+    feature: whether the kernel has the feature; mount: how the files are mounted.
+    confined: on a kernel with a policy the run is in the tool's domain. The policy is for regular
+    files. It has no rules for the probe, which no product contains.
     """
 
     def __init__(self, name, file, *options, program=TOOL, before=None, feature=True, mount="rw",
@@ -60,7 +60,7 @@ class Run:
 
 
 def all_runs(golden):
-    """In the order in which they take place."""
+    """All runs, in order."""
     changed = "printf X | dd of=jars/changed.jar bs=1 seek=40 conv=notrunc 2>/dev/null"
     return [
         Run("no-feature", f"{GOOD}/base.apk", "--integrity", "missing", feature=False),
@@ -141,10 +141,10 @@ def golden_names(directory):
 
 
 def simulate(run, directory, build, out):
-    """Runs it in the simulated phone; the journal goes to OUT/NAME.journal."""
+    """Runs it in the simulated phone. The journal goes to OUT/NAME.journal."""
     if run.before:
         subprocess.run(run.before, shell=True, cwd=directory, check=True)
-    command = [build / "bin/apktoolkit-sim", "--json", "--state", out / "state", *run.options]
+    command = [build / "bin/apktoolkit-sim", "--install=no", "--json", "--state", out / "state", *run.options]
     command += ["--verify"] if run.program == VERIFY else ["--tool", build / "bin" / run.program]
     command.append(directory / run.file)
     if run.mount == "ro":
@@ -169,7 +169,7 @@ PARAMETERS = {"--integrity": "1f", "--sign-errno": "0", "--verify-errno": "ENOKE
 
 
 def guest_lines(run, before):
-    """The run as the functions of tests/kernel/init; `before` is the run before it."""
+    """The run as calls of the functions of tests/kernel/init; `before` is the run before it."""
     if run.feature and not before.feature:
         yield "load_feature"
     if run.before:

@@ -1,5 +1,5 @@
-// Lists a manifest whose sections are in no order, and finds one. With the argument "hash" it does
-// what has to be trapped: it hashes by the C++ library.
+// Lists a manifest whose sections are not sorted, and finds one. With the argument "hash" it uses
+// the C++ library's hash, which must be trapped.
 #include <cstdio>
 #include <functional>
 #include <string>

@@ -1,6 +1,7 @@
 #!/usr/bin/env python3
-"""check_phone.py PROGRAMS GOLDEN: holds integration/phone and METADATA against the blueprints, and tries
-try-on-phone with a stand-in for adb (tests/phone/adb), on phones that work and on phones that do not.
+"""check_phone.py PROGRAMS GOLDEN: compares integration/phone and METADATA with the blueprints.
+Tries try-on-phone with a stand-in for adb (tests/phone/adb), on phones that work and on phones
+that do not.
 
 PROGRAMS is the directory of the built programs, GOLDEN that of the golden packages.
 """
@@ -29,7 +30,7 @@ def modules(path, kind):
 
 
 def check_makefile():
-    """What a product's makefile gets is what the blueprint builds."""
+    """A product's makefile gets exactly the programs that the blueprint builds."""
     text = f"include {KIT}/apktoolkit.mk\n$(info $(PRODUCT_PACKAGES))\nall:;@:\n"
     result = subprocess.run(["make", "--silent", "-f", "-"], input=text, text=True, check=True,
                             stdout=subprocess.PIPE)
@@ -38,7 +39,8 @@ def check_makefile():
 
 
 def check_service():
-    """The service starts a program that is installed, is installed with it, and does not start itself."""
+    """The service's program is installed, together with the service. The service does not start
+    itself."""
     lines = [line.split() for line in (KIT / "apktoolkit.rc").read_text().splitlines()
              if line and not line.startswith("#")]
     problems = []
@@ -53,7 +55,7 @@ def check_service():
 
 
 def check_tests():
-    """Each test of the blueprint is pushed, and runs from where it was pushed to."""
+    """Each test of the blueprint is pushed, and runs in the directory that it was pushed to."""
     tree = xml.etree.ElementTree.parse(KIT / "AndroidTest.xml")
     options = [(option.get("name"), option.get("value")) for option in tree.iter("option")]
     pushed = {value for name, value in options if name == "push"}
@@ -70,7 +72,8 @@ def check_tests():
 
 
 def check_license():
-    """The blueprints with what a tree of Android 12 appends: one license, by which all modules go."""
+    """The blueprints, with the lines that a tree of Android 12 appends, have one license for all
+    modules."""
     problems = []
     with tempfile.TemporaryDirectory(dir=ROOT / "build") as name:
         both = pathlib.Path(name) / "Android.bp"
@@ -90,7 +93,7 @@ def modules_of(path, kind):
 
 
 def check_metadata():
-    """The form, and version and day of the newest heading in CHANGES.md."""
+    """METADATA has the right form, and the version and day of the newest heading in CHANGES.md."""
     with (ROOT / "METADATA").open() as metadata:
         result = subprocess.run(["protoc", f"--proto_path={HERE}", "--encode=Metadata",
                                  HERE / "metadata.proto"], stdin=metadata, capture_output=True, check=False)
@@ -106,7 +109,8 @@ def check_metadata():
 
 
 def trial(programs, package, mood=""):
-    """try-on-phone, in a phone of its own; its status, what it printed, and what it left behind."""
+    """Runs try-on-phone on a phone of its own. Returns its status, its output, and the files it
+    left."""
     with tempfile.TemporaryDirectory() as name:
         phone = pathlib.Path(name) / "phone"
         built = pathlib.Path(name) / "system"
@@ -136,8 +140,8 @@ def check_trial(programs, golden):
            "base.apk: not trusted (errno 126, ENOKEY)\n")
     expect("a kernel that refuses", trial(programs, good, "--sign-errno EPERM"), 1,
            "E/ApkToolkit: VELT can't sign a file (result=10000, errno 1", "base.apk: not trusted")
-    expect("no phone", trial(programs, good, "no phone"), 2, "try-on-phone: there is no phone\n")
-    expect("no root", trial(programs, good, "no root"), 2, "it takes a userdebug build\n")
+    expect("no phone", trial(programs, good, "no phone"), 2, "try-on-phone: adb finds no phone: connect one, or start adb\n")
+    expect("no root", trial(programs, good, "no root"), 2, "install a userdebug build on the phone\n")
     expect("no package", trial(programs, golden), 2, "usage: try-on-phone")
     with tempfile.TemporaryDirectory() as name:
         changed = pathlib.Path(name) / "package"

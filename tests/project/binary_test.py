@@ -27,11 +27,11 @@ GOOD = {"bind": "-Wl,-z,now", "table": "-Wl,-z,relro", "place": "-pie -fPIE",
 
 # The flag that removes a part, and the message about it.
 BAD = [("bind", "-Wl,-z,lazy", "binds its symbols when they are called"),
-       ("table", "-Wl,-z,norelro", "can be written"),
-       ("place", "-no-pie -fno-pie", "lies where it was linked to"),
+       ("table", "-Wl,-z,norelro", "is writable"),
+       ("place", "-no-pie -fno-pie", "is not position-independent"),
        ("stack", "-fno-stack-protector", "no stack is protected"),
        ("calls", "-U_FORTIFY_SOURCE", "no call is checked"),
-       ("heap", "-O2 -Wl,-z,execstack", "can be executed")]
+       ("heap", "-O2 -Wl,-z,execstack", "is executable")]
 
 
 def compiled(compiler, directory, parts, *more):

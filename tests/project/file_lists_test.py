@@ -46,7 +46,8 @@ PLATFORM_ONLY_FLAGS = {"-Wno-sign-conversion", "-Werror"}
 # from its own directory, which is that of the CMakeLists.txt for all but the programs of integration/.
 MODULES = {
     "Android.bp": {"apktoolkit_core": ["apktoolkit_core"], "apktoolkit": ["apktoolkit"],
-                   "apktoolkit-verify": ["apktoolkit-verify"], "libzu": ["zu"],
+                   "apktoolkit-verify": ["apktoolkit-verify"],
+                   "apktoolkit_verification": ["apktoolkit_verification"], "libzu": ["zu"],
                    "apktoolkit-all": ["integration:apktoolkit-all", "integration:apktoolkit_caller"],
                    "apktoolkit-bound": ["integration:apktoolkit-bound"]},
     "tests/Android.bp": {"apktoolkit_test_support": ["tests/support:test_support"],

@@ -33,7 +33,7 @@ def prepare(golden, directory):
     library = directory / "tampered/lib/arm64/libvault.so"
     library.write_bytes(library.read_bytes()[:-1])
     for name, source in (("newer-only", "apksigner-newer-only"), ("changed-dex", "changed-dex"),
-                         ("added-entry", "added-entry")):
+                         ("added-entry", "added-entry"), ("sha1", "apksigner-sha1-2048")):
         shutil.copytree(golden / source, directory / name)
     (directory / "alone").mkdir()
     shutil.copy(package / "base.apk", directory / "alone")

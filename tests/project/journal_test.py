@@ -39,7 +39,11 @@ def runs(package, directory):
     yield ["--trust", jar, jar]
     alone = directory / "alone.apk"
     shutil.copy(package, alone)
-    yield ["--strict", alone]
+    yield ["--strict", "--install=no", alone]
+    yield ["--signer", "0" * 64, alone]
+    yield ["--install", alone]
+    (directory / "empty").mkdir()
+    yield ["--recursive", directory / "empty"]
     yield [damaged]
     yield [odd_name]
 

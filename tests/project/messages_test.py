@@ -59,10 +59,12 @@ CAUSE = re.compile(r"inline constexpr Cause (?P<name>k\w+) = \{\s*(?P<code>%s),\
 GROUPS = {"kNotLookedAt": "The tool did not look at the file",
           "kSimulation": "The simulation could not tell", "kFile": "What the file is",
           "kSignature": "A package's signature", "kKernel": "The kernel", "kLibrary": "A library",
-          "kKey": "The key", "kTool": "The tool itself", "kWarning": "Warnings"}
+          "kKey": "The key", "kTool": "The tool itself",
+          "kInstaller": "The installer of the phones",
+          "kGate": "The gate: what the command line demands", "kWarning": "Warnings"}
 
 # Groups of causes that leave the chain from the key to the entries whole. All others must break it.
-UNBROKEN = {"kKernel", "kKey", "kWarning"}
+UNBROKEN = {"kKernel", "kKey", "kInstaller", "kGate", "kWarning"}
 
 PAGE = ROOT / "docs/messages.md"
 REASONS = re.compile(r"(?<=\n)%s:\n.*" % GROUPS["kNotLookedAt"], re.S)
@@ -135,6 +137,21 @@ def log_problems(messages):
     return problems
 
 
+# A row of the starts of messages that the library makes reasons from.
+LIBRARY = ROOT / "library/verification.cpp"
+LIBRARY_TEXT = re.compile(r"\{(%s), Reason::k\w+\}" % LITERALS)
+
+
+def library_problems(messages):
+    source = LIBRARY.read_text()
+    starts = [joined(text) for text in LIBRARY_TEXT.findall(source)]
+    problems = [f"{LIBRARY}: the tool does not log {start}" for start in starts
+                if not any(message.startswith(start) for message in messages)]
+    if not starts or len(starts) != source.count(", Reason::k"):
+        problems.append(f"{LIBRARY}: a row does not read")
+    return problems
+
+
 FIX = f"""an entry of {PAGE} is "### `TEXT`", an empty line, and what the message means;
 messages_test.py --write adds its priority and its files. The texts that the simulator looks for are in
 {LOG_LINES}, its reasons in {CAUSES}."""
@@ -146,7 +163,7 @@ def main():
     entries = [entry[1] for entry in ENTRY.finditer(page)]
     problems = [f"{PAGE} has no entry for this message: {text}" for text in texts if text not in entries]
     problems += [f"nothing writes this message: {text}" for text in entries if text not in texts]
-    problems += log_problems(texts) + reasons_problems(rows, texts)
+    problems += log_problems(texts) + reasons_problems(rows, texts) + library_problems(texts)
     page = ENTRY.sub(lambda entry: entry[0] if entry[1] not in texts else
                      f"### `{entry[1]}`\n\n{texts[entry[1]]}{(entry[2] or ' ')[-1]}", page)
     page = REASONS.sub(lambda _: tables(rows), page)

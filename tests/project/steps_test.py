@@ -120,11 +120,11 @@ def run_problems():
 
 def skip_problems():
     """scripts/kernel and scripts/bare-system say why they cannot run here, and by their status that they did not."""
-    needs_root = "a bare system can be made by root alone"
+    needs_root = "only root can make a bare system"
     for script, setup, reason in (
-            ("kernel", "[[ $1 != emulator ]]", "there is no qemu, and it cannot be installed"),
-            ("bare-system 13", "exit 1", "debootstrap is not there, and cannot be installed"),
-            ("bare-system 13", "true", "there is no http://mirror.invalid/debian/dists/trixie/Release to be had")):
+            ("kernel", "[[ $1 != emulator ]]", "qemu is missing, and apt-get cannot install it"),
+            ("bare-system 13", "exit 1", "debootstrap is missing, and apt-get cannot install it"),
+            ("bare-system 13", "true", "http://mirror.invalid/debian/dists/trixie/Release cannot be fetched")):
         with scripts(script.split()[0]) as directory:
             write(directory / "wget", "exit 4")
             write(directory / "scripts/setup", setup)

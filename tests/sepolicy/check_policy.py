@@ -1,8 +1,9 @@
 #!/usr/bin/env python3
-"""Compiles integration/sepolicy with stand-ins for the platform's policy, for every kind of release that
-it is written for, and holds what it grants against the list below: nothing less, and nothing more.
+"""Compiles integration/sepolicy with stand-ins for the platform's policy, for every supported kind
+of release. Compares the permissions that it grants with the list below: it must grant exactly
+these.
 
-m4, checkpolicy, secilc and setfiles are Debian's. What has to be refused is compiled, too.
+m4, checkpolicy, secilc and setfiles are Debian's. Rules that must be refused are compiled, too.
 """
 
 import pathlib
@@ -15,14 +16,13 @@ HERE = pathlib.Path(__file__).resolve().parent
 KIT = HERE.parents[1] / "integration/sepolicy"
 ALLOW = re.compile(r"\(allow (\S+) (\S+) \((\S+) \(([^)]*)\)\)\)")
 
-# By API level: what a product defines for m4, and what the policy does not know there.
+# By API level: the product's definitions for m4, and the words that the policy does not know there.
 LEVELS = {27: (["-Dapktoolkit_level=27"], {"map", "system_file_type"}),
           28: (["-Dapktoolkit_level=28"], {"system_file_type"}),
           29: ([], set()),
           36: ([], set())}
 
-# What each domain may do, as "target:class permissions". What a domain gets from the macros is part
-# of it.
+# The permissions of each domain, as "target:class permissions", including those from the macros.
 GRANTED = {
     "apktoolkit": [
         "apktoolkit_exec:file entrypoint execute execute_no_trans getattr map open read",
@@ -66,7 +66,7 @@ GRANTED_WITH_ZU = {
     "zu_server": ["apktoolkit:binder transfer"],
 }
 
-# Rules that the kit's own assertions refuse, wherever a product writes them.
+# Rules that the kit's own assertions must refuse in any product's policy.
 REFUSED = [
     "allow apktoolkit apk_data_file:file write;",
     "allow apktoolkit system_file:file append;",
@@ -87,23 +87,23 @@ def expand(level, defines, parts):
     return result.stdout
 
 
-def compiled(folder, level, parts, more=""):
-    """The policy in CIL, or the compiler's complaint; `more` are further rules."""
-    text = folder / "policy.conf"
+def compiled(directory, level, parts, more=""):
+    """The policy in CIL, or the compiler's error; `more` are further rules."""
+    text = directory / "policy.conf"
     rules = expand(level, LEVELS[level][0], [HERE / "platform.conf", *parts])
     text.write_text(rules + more + (HERE / "platform_end.conf").read_text())
-    for options in (["-o", folder / "binary"], ["-C", "-o", folder / "cil"]):
+    for options in (["-o", directory / "binary"], ["-C", "-o", directory / "cil"]):
         result = run("checkpolicy", "-M", "-c", "30", *options, text)
         if result.returncode != 0:
             return None, result.stdout
-    result = run("secilc", "-c", "30", "-o", folder / "policy", "-f", "/dev/null", folder / "cil")
+    result = run("secilc", "-c", "30", "-o", directory / "policy", "-f", "/dev/null", directory / "cil")
     if result.returncode != 0:
         return None, result.stdout
-    return (folder / "cil").read_text(), ""
+    return (directory / "cil").read_text(), ""
 
 
 def grants(cil):
-    """For each source the set of (target, class, permission) that the policy allows it."""
+    """For each source, the set of (target, class, permission) that the policy allows."""
     found = {}
     for source, target, kind, permissions in ALLOW.findall(cil):
         for permission in permissions.split():
@@ -130,32 +130,32 @@ def difference(name, found, expected):
             for rule in sorted(rules)]
 
 
-def check(folder, level):
+def check(directory, level):
     unknown = LEVELS[level][1]
     tool, zu = KIT / "apktoolkit.te", KIT / "apktoolkit_zu.te"
     problems = []
     for name, parts, listed in (
             (f"level {level}", [tool], GRANTED),
             (f"level {level} with libzu", [HERE / "zu.conf", tool, zu], {**GRANTED, **GRANTED_WITH_ZU})):
-        cil, complaint = compiled(folder, level, parts)
+        cil, complaint = compiled(directory, level, parts)
         if cil is None:
             problems.append(f"{name}: {complaint}")
             continue
         problems += difference(name, grants(cil), wanted(listed, unknown))
         if ("typeattributeset system_file_type" in cil) == ("system_file_type" in unknown):
             problems.append(f"{name}: system_file_type is used where there is none, or not where there is")
-        labels = run("setfiles", "-c", folder / "policy", KIT / "file_contexts")
+        labels = run("setfiles", "-c", directory / "policy", KIT / "file_contexts")
         if labels.returncode != 0:
             problems.append(f"{name}: file_contexts: {labels.stdout}")
     for rule in REFUSED:
-        cil, complaint = compiled(folder, level, [tool], rule + "\n")
+        cil, complaint = compiled(directory, level, [tool], rule + "\n")
         if cil is not None or "neverallow" not in complaint:
             problems.append(f"level {level}: '{rule}' is not refused: {complaint}")
     return problems
 
 
 def check_names():
-    """Every program of the kit has a label, and no label is for anything else."""
+    """Every program of the kit has a label, and every label belongs to a program."""
     programs = {"apktoolkit", "apktoolkit-all", "apktoolkit-bound", "apktoolkit-verify"}
     patterns = [line.split()[0] for line in (KIT / "file_contexts").read_text().splitlines()
                 if line and not line.startswith("#")]

@@ -1,5 +1,5 @@
-// A library that is touched, exchanged or written to while the tool works on it. The changes come
-// at exact moments: before an open, after it, before and after a read, before the kernel signs.
+// A library that is touched, exchanged or written to while the tool works on it. Each change comes
+// at an exact moment: before an open, after it, before and after a read, before the kernel signs.
 #include <gtest/gtest.h>
 #include <sys/stat.h>
 
@@ -33,7 +33,7 @@ class ChangedLibrary : public testing::Test {
   void SetUp() override { alarm(60); }  // ends a test that waits for a FIFO
   void TearDown() override { alarm(0); }
 
-  // The library is signed after so many digests, and nothing is said but that.
+  // The library is signed after this number of digests, and nothing else is logged.
   void ExpectSigned(int digests) {
     EXPECT_EQ(file_.SignJni(), 0U);
     EXPECT_EQ(signed_, std::vector<Bytes>({kGood.data}));
@@ -54,16 +54,16 @@ class ChangedLibrary : public testing::Test {
     close(next);
   }
 
-  // Puts the file of this name in the library's place.
+  // Moves the file of this name to the library's path.
   void Rename(const std::string& name) const {
     EXPECT_EQ(rename(file_.Path(name).c_str(), target_.c_str()), 0);
   }
-  // Has the library's place lead to the file of this name, whose state stays as it is.
+  // Makes the library's path lead to the file of this name, whose state does not change.
   void Link(const std::string& name) const {
     unlink(target_.c_str());
     EXPECT_EQ(symlink(file_.Path(name).c_str(), target_.c_str()), 0);
   }
-  // Writes the other bytes, which are as many, into the file itself.
+  // Writes other bytes, of the same number, into the file itself.
   void WriteInPlace() const {
     UntilNoticed([this] {
       FILE* const file = fopen(target_.c_str(), "r+");
@@ -72,7 +72,7 @@ class ChangedLibrary : public testing::Test {
     });
   }
 
-  // Changes the file until its state tells of it: the clock of a file system is coarse.
+  // Changes the file until its state shows it, because a file system's clock is coarse.
   void UntilNoticed(const Change& change) const {
     const struct stat before = State();
     do {
@@ -86,7 +86,7 @@ class ChangedLibrary : public testing::Test {
     return state;
   }
 
-  // How many descriptors of this process are open on the library.
+  // The number of this process's descriptors that are open on the library.
   int DescriptorsOfLibrary() const {
     const struct stat library = State();
     int count = 0;
@@ -115,12 +115,12 @@ class ChangedLibrary : public testing::Test {
   Change before_digest_[9], after_digest_[9];  // by the digest's number, from 1
   int opens_ = 0;
   int digests_ = 0;
-  std::vector<Bytes> signed_;  // the bytes behind each descriptor that was signed
+  std::vector<Bytes> signed_;  // the bytes behind each signed descriptor
 };
 
 TEST_F(ChangedLibrary, LeftAloneIsSignedAfterOneDigest) { ExpectSigned(1); }
 
-// --- Touched, and its bytes as they were. A test for each way of an installer's to finish its
+// --- Touched, with unchanged bytes. One test for each way in which an installer may finish its
 // work.
 
 class TouchedLibrary : public ChangedLibrary, public testing::WithParamInterface<const char*> {
@@ -189,7 +189,7 @@ TEST_F(ChangedLibrary, ExchangedAfterItsSecondOpeningIsSignedAsItWasOpened) {
   ExpectSigned(2);
 }
 
-// The file lost its name, which changes its state.
+// The file has lost its name, which changes its state.
 TEST_F(ChangedLibrary, ExchangedAfterItsLastByteIsSignedAsItWasRead) {
   before_second_open_ = [this] { Rename("good"); };
   after_digest_[2] = [this] { Rename("evil"); };
@@ -201,7 +201,8 @@ TEST_F(ChangedLibrary, ExchangedBeforeTheKernelSignsIsSignedAsItWasRead) {
   ExpectSigned(1);
 }
 
-// The path leads to the file that was read, in the state that it had: the descriptor tells.
+// The path leads to the file that was read, in its former state. Only the descriptor shows the
+// exchange.
 TEST_F(ChangedLibrary, ExchangedForTheMomentOfItsOpeningIsRefused) {
   Link("good");
   before_second_open_ = [this] { Link("evil"); };
@@ -216,7 +217,7 @@ TEST_F(ChangedLibrary, ExchangedForTheMomentOfItsFirstDigestIsRefused) {
   ExpectRefused(2);
 }
 
-// --- No regular file any more: refused at once.
+// --- No longer a regular file: refused at once.
 
 TEST_F(ChangedLibrary, ExchangedForAFifoIsRefusedAtOnce) {
   before_second_open_ = [this] {
@@ -231,8 +232,8 @@ TEST_F(ChangedLibrary, ExchangedForADirectoryIsRefusedAtOnce) {
   ExpectRefused(1);
 }
 
-// A file system may give the inode number of a file that is gone to the next one. With the same
-// size and the times of one tick of its clock it would look like the file that was read.
+// A file system may give a removed file's inode number to the next file. With the same size, and
+// with times of the same clock tick, it would look like the file that was read.
 TEST_F(ChangedLibrary, IsKeptOpenUntilItIsOpenedAgainSoThatNoOtherFileGetsItsNumber) {
   after_digest_[1] = [this] { EXPECT_EQ(DescriptorsOfLibrary(), 1); };
   before_second_open_ = [this] { EXPECT_EQ(DescriptorsOfLibrary(), 1); };
@@ -249,7 +250,7 @@ TEST_F(ChangedLibrary, ThatAppearsWhenItsFirstOpeningHasFailedIsRefused) {
   EXPECT_EQ(asked, 2);
 }
 
-// --- Written to in place, and the times tell.
+// --- Written to in place, which the times show.
 
 TEST_F(ChangedLibrary, WrittenToBeforeItsSecondOpeningIsRefused) {
   before_second_open_ = [this] { WriteInPlace(); };
@@ -284,10 +285,10 @@ TEST_F(ChangedLibrary, ThatIsLeasedAtItsSecondOpeningIsSigned) {
     return path == target_ && ++asked == 2 ? EWOULDBLOCK : 0;
   };
   ExpectSigned(1);
-  EXPECT_EQ(asked, 3);  // the third pins the file, which is then opened by way of its descriptor
+  EXPECT_EQ(asked, 3);  // the third pins the file, which is then opened through its descriptor
 }
 
-// The holder has the time to put anything in the file's place.
+// Meanwhile the holder can put anything in the file's place.
 TEST_F(ChangedLibrary, ThatIsLeasedAndThenAFifoIsNotWaitedFor) {
   int asked = 0;
   file_.phone.open_error = [&](const char* path, int) {

@@ -1,4 +1,4 @@
-// The kernel interface: what is asked of the kernel, when it is not asked at all, and the waiting.
+// The kernel interface: the calls to the kernel, the cases without a call, and the waiting.
 #include "sign/integrity.h"
 
 #include <gtest/gtest.h>
@@ -17,8 +17,8 @@ using Events = std::vector<std::string>;
 constexpr char kSelf[] = "integrity /proc/self/integrity/value";
 constexpr uint8_t kPayload[] = {3, 0, 0xaa, 0xbb, 0xcc};  // length 3, then 3 bytes
 
-// The codes are part of the interface: 0, and 65536 for every failure, whatever the cause and the
-// kernel's own number for it.
+// The codes are part of the interface: 0 for success, and 65536 for every failure. Neither the
+// cause nor the kernel's own number matters.
 TEST(VeltResultCode, EveryFailureIs65536) {
   constexpr uint32_t kFailure = 65536;
   Phone phone;
@@ -26,7 +26,7 @@ TEST(VeltResultCode, EveryFailureIs65536) {
   EXPECT_EQ(VeltSignFd(7, nullptr), kFailure);
   EXPECT_EQ(VeltTaskReadIntegrity(0, 0, nullptr), kFailure);
   EXPECT_EQ(VeltTaskReadIntegrity(-1, 0, &value), kFailure);
-  // 0 alone is success, in either direction.
+  // Only 0 is success. Numbers above and below it are failures.
   for (const int result : {1, 2, -2, 65536, INT_MAX, INT_MIN}) {
     phone.kernel_result = result;
     EXPECT_EQ(VeltSignFd(7, kPayload), kFailure) << result;
@@ -142,7 +142,7 @@ TEST(VeltVerifyFd, AFileThatTheKernelHasNotSignedFailsWithTheErrnoOfTheKernel) {
 }
 
 TEST(VeltVerifyFd, AKernelWithoutTheFeatureRefuses) {
-  // No Phone: this machine's own kernel, which does not know the command.
+  // Without a Phone, this machine's own kernel answers. It does not know the command.
   errno = 0;
   EXPECT_EQ(VeltVerifyFd(0), 0x10000U);
   EXPECT_EQ(errno, EINVAL);

@@ -1,5 +1,5 @@
-// What main does before and around the three steps, as a process without a phone: its log goes to
-// standard error there.
+// main before and around the three steps, as a process without a phone. Its log goes to standard
+// error.
 #include <gtest/gtest.h>
 #include <sys/stat.h>
 
@@ -11,7 +11,7 @@
 
 namespace {
 
-// Runs the tool by way of a shell, which gives it the file as $1 and is told what to do with it.
+// Runs the tool by a shell command, which gets the tool as $0 and the file as $1.
 ProcessResult RunTool(const std::string& command, const std::string& file) {
   return RunProcess({"sh", "-c", command, ToolPath(), file});
 }
@@ -35,12 +35,12 @@ TEST(Main, WithoutStandardInputTheFileIsLeftAlone) {
   EXPECT_EQ(run.output + run.errors, "");
 }
 
-TEST(Main, AFifoIsNoArchiveAndNothingToWaitFor) {
-  const TempDir folder;
-  ASSERT_EQ(mkfifo((folder / "fifo").c_str(), 0600), 0);
-  const ProcessResult run = RunTool("timeout 20 \"$0\" \"$1\" </dev/null", folder / "fifo");
+TEST(Main, AFifoIsRefusedWithoutWaiting) {
+  const TempDir directory;
+  ASSERT_EQ(mkfifo((directory / "fifo").c_str(), 0600), 0);
+  const ProcessResult run = RunTool("timeout 20 \"$0\" \"$1\" </dev/null", directory / "fifo");
   EXPECT_EQ(run.status, 0);
-  EXPECT_TRUE(Says(run, "OpenArchiveFd(3) [file: " + folder / "fifo" + "] returned: "))
+  EXPECT_TRUE(Says(run, "OpenArchiveFd(3) [file: " + directory / "fifo" + "] returned: "))
       << run.errors;
   EXPECT_TRUE(Says(run, "Zip archive is not valid for fd=3")) << run.errors;
 }

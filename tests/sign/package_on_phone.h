@@ -21,7 +21,7 @@ using Events = std::vector<std::string>;
 inline constexpr char kSelf[] = "integrity /proc/self/integrity/value";
 
 // The payload of every package signed with the key "rsa-2048": the length 32, then the digest of
-// its modulus by libcrypto.
+// its modulus, by libcrypto.
 inline std::string PackagePayload() {
   const Bytes modulus = ModulusOf("rsa-2048");
   uint8_t digest[SHA256_DIGEST_LENGTH];
@@ -40,7 +40,7 @@ inline LogRecord Starts(int fd) {
 }
 inline LogRecord Finished() { return Info("VeltSignJni finished: 0.\n"); }
 
-// A package in a directory of its own, opened as the driver does, with the log and the phone ready.
+// A package in its own directory, opened as main opens it, with the log and the phone ready.
 class PackageOnPhone {
  public:
   explicit PackageOnPhone(const Package& package, const std::string& directory = "")
@@ -52,7 +52,7 @@ class PackageOnPhone {
   }
   ~PackageOnPhone() { close(fd_); }
 
-  // Puts the item's bytes on disk, at `path` in the package's directory.
+  // Writes the item's bytes to disk, at `path` in the package's directory.
   void Install(const std::string& path, const ZipItem& item) const { temp_.Write(path, item.data); }
   std::string Path(const std::string& path) const { return temp_ / path; }
 

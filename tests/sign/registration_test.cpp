@@ -1,4 +1,4 @@
-// Who is registered, under which name and with which bytes, and what is said about it.
+// Registrations: the file, the name, the bytes, and the log about them.
 #include "sign/registration.h"
 
 #include <gtest/gtest.h>
@@ -16,7 +16,7 @@ namespace {
 
 using Events = std::vector<std::string>;
 
-// An archive in memory, opened as the driver does, with the log and the phone ready.
+// An archive in memory, opened as main opens it, with the log and the phone ready.
 struct ArchiveOnPhone {
   explicit ArchiveOnPhone(const Package& package) : open(package), apk(open.apk) { log.Clear(); }
   int fd() const { return open.file.fd(); }
@@ -37,7 +37,8 @@ std::string RegisterPackage(int fd) {
   return "register " + std::to_string(fd) + " com.example.app " + Hex(ModulusOf("rsa-2048"));
 }
 
-// Four SHA-256 digests, each of the one before it, the first of the path's bytes; by libcrypto.
+// Four SHA-256 digests by libcrypto. The first is of the path's bytes, each other of the one before
+// it.
 std::string RegisterJar(int fd, const std::string& path) {
   uint8_t block[4 * SHA256_DIGEST_LENGTH];
   SHA256(reinterpret_cast<const uint8_t*>(path.data()), path.size(), block);
@@ -88,7 +89,7 @@ TEST(ZuSign, TheRegistrationIsMadeForTheSecondDescriptor) {
 }
 
 TEST(ZuSign, APackageWithThePermissionThatTurnedBadIsNotRegistered) {
-  // The permission is known only of a package whose manifest verified; its dex file is bad.
+  // The permission is known only if the manifest verified. The dex file is bad.
   Package package = SecureStoragePackage();
   package.Tamper("classes.dex");
   ArchiveOnPhone file(package);
@@ -118,7 +119,7 @@ TEST(ZuSign, AJarWithoutTheAttributeIsLeftAlone) {
   EXPECT_EQ(file.log.records(), Records());
 }
 
-// Only its size matters, and that of the first descriptor's file.
+// Only the attribute's size is read, on the first descriptor's file.
 TEST(ZuSign, TheAttributeIsAskedOfTheFirstDescriptorWithoutABuffer) {
   ArchiveOnPhone file(MakePackage(PlainJar()));
   file.phone.zu_attribute_size = 1;
@@ -182,7 +183,7 @@ TEST(ZuSign, TheRefusalOfAJarIsReported) {
                                          Error("ZuAddCertificate: ZuNewCertificate failed 5.\n")}));
 }
 
-TEST(ZuSign, AFileThatIsNoZipArchiveStopsSilentlyAtThePermission) {
+TEST(ZuSign, AFileThatIsNotAZipArchiveStopsSilentlyAtThePermission) {
   LogCapture log;
   Phone phone;
   phone.zu_attribute_size = 1;

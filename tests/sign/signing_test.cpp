@@ -1,4 +1,4 @@
-// What the kernel is asked to sign, with which payload, and what is said about it. Packages are
+// The files that the kernel is asked to sign, their payloads, and the log about them. Packages are
 // real files with their libraries beside them; the kernel is the Phone's.
 #include "sign/signing.h"
 
@@ -19,7 +19,7 @@ Package BadPackage() {
   return package;
 }
 
-// The library that the walk over the package begins with.
+// The library that comes first in the walk over the package.
 std::string FirstOf(ApkTools::Apk& apk) {
   void* cookie = nullptr;
   EXPECT_EQ(apk.StartIteration(&cookie, "lib/", ".so"), 0);
@@ -71,7 +71,7 @@ TEST(VeltSign, APackageThatDidNotVerifyIsNotSignedAndGetsNoMessageOfItsOwn) {
                                          Info("VeltSign finished: 65536.\n")}));
 }
 
-TEST(VeltSign, AFileThatIsNoZipArchiveIsRefused) {
+TEST(VeltSign, AFileThatIsNotAZipArchiveIsRefused) {
   LogCapture log;
   Phone phone;
   MemoryFile file(ToBytes("no archive"));
@@ -143,7 +143,7 @@ TEST(VeltSignJni, ALibraryIsSignedOnItsOwnDescriptorWithThePayloadOfThePackage) 
   PackageOnPhone file(MakePackage(WithLibraries({library})));
   file.Install("lib/arm64/libfoo.so", library);
   EXPECT_EQ(file.SignJni(), 0U);
-  // The library's descriptor is the lowest free one, the one after the package's.
+  // The library gets the lowest free descriptor, which follows the package's.
   EXPECT_EQ(file.phone.events, Events({kSelf, SignEvent(file.fd() + 1)}));
   EXPECT_EQ(file.log.records(),
             Records({Starts(file.fd()), Info("VeltSignOat: Apk case.\n"), Finished()}));
@@ -157,7 +157,7 @@ TEST(VeltSignJni, TheDescriptorOfALibraryIsClosed) {
   EXPECT_EQ(fcntl(file.fd() + 1, F_GETFD), -1);
 }
 
-// As in a process that was started without standard input.
+// The process was started without standard input.
 TEST(VeltSignJni, ALibraryMayHaveDescriptor0) {
   const ZipItem library = Library("lib/arm64-v8a/libfoo.so");
   PackageOnPhone file(MakePackage(WithLibraries({library})));
@@ -180,8 +180,8 @@ TEST(VeltSignJni, ALibraryIsOpenedWithoutWaiting) {
   EXPECT_EQ(flags, std::vector<int>({O_RDONLY | O_NONBLOCK | O_CLOEXEC, O_RDONLY | O_NONBLOCK}));
 }
 
-// What lies among the libraries and is none is left alone, though the manifest lists it.
-TEST(VeltSignJni, AnEntryOfAnotherEndingIsNoLibrary) {
+// A file among the libraries that is not a library is left alone, even if the manifest lists it.
+TEST(VeltSignJni, AnEntryWithAnotherEndingIsNotALibrary) {
   const std::vector<ZipItem> others = {Library("lib/arm64-v8a/libfoo.so.txt"),
                                        Library("lib/arm64-v8a/libfoo.SO"),
                                        Library("lib/arm64-v8a/so")};
@@ -210,10 +210,10 @@ TEST(VeltSignJni, AnEntryOfNoRowIsPassedOverWithoutAMessage) {
   EXPECT_EQ(file.log.records(), Records({Starts(file.fd()), Finished()}));
 }
 
-// The order of the two is the zip library's, which goes by their names.
-TEST(VeltSignJni, ALibraryOfAnotherAbiEndsNothingWhicheverIsWalkedFirst) {
+// The zip library orders the two by their names.
+TEST(VeltSignJni, ALibraryOfAnotherAbiDoesNotEndTheWalkInEitherOrder) {
   const ZipItem library = Library("lib/arm64-v8a/libfoo.so");
-  int first = 0, last = 0;  // how often the other was
+  int first = 0, last = 0;  // how often the other library was
   for (int i = 0; i < 100 && (first == 0 || last == 0); ++i) {
     const ZipItem other = Library("lib/x86/lib" + std::to_string(i) + ".so");
     PackageOnPhone file(MakePackage(WithLibraries({library, other})));
@@ -228,7 +228,7 @@ TEST(VeltSignJni, ALibraryOfAnotherAbiEndsNothingWhicheverIsWalkedFirst) {
   EXPECT_GT(last, 0);
 }
 
-// Signs the entry when it lies at `installed`; true when the kernel was asked to sign it.
+// Signs the entry, with its file at `installed`. True if the kernel was asked to sign it.
 bool IsFoundAt(const std::string& entry, const std::string& installed) {
   const ZipItem library = Library(entry);
   PackageOnPhone file(MakePackage(WithLibraries({library})));
@@ -303,7 +303,7 @@ TEST(VeltSignJni, ALibraryWhoseBytesDifferIsNotSignedAndTheOthersAre) {
   file.Install("lib/arm64/libb.so", {"", ToBytes("\177ELF other bytes")});
   EXPECT_EQ(file.SignJni(), 0U);
   EXPECT_EQ(file.phone.events, Events({kSelf, SignEvent(file.fd() + 1)}));
-  // The order of the two is the zip library's.
+  // The zip library orders the two.
   const LogRecord refused =
       Error("VeltSignJni: File not verified: " + file.Path("lib/arm64/libb.so") + "\n");
   const LogRecord signs = Info("VeltSignOat: Apk case.\n");
@@ -350,8 +350,7 @@ TEST(VeltSignJni, ARefusalOfTheKernelDoesNotChangeTheResult) {
                      Finished()}));
 }
 
-// The file goes away between the check and the opening: the reading of the file is the only open
-// that succeeds.
+// The file vanishes between the check and the opening: only the open for the check succeeds.
 TEST(VeltSignJni, ALibraryThatCannotBeOpenedAfterItsCheckIsReportedWithItsErrno) {
   const ZipItem library = Library("lib/arm64-v8a/libfoo.so");
   PackageOnPhone file(MakePackage(WithLibraries({library})));

@@ -1,5 +1,5 @@
-// What the zip library is asked, where its answers do not tell. The linker sends the calls of the
-// tool here (CMakeLists.txt names them as the compiler does) and they go on to the library.
+// The calls to the zip library, because its answers do not show them. The linker sends the tool's
+// calls here (CMakeLists.txt has the compiler's names), and they go on to the library.
 #include <gtest/gtest.h>
 
 #include <algorithm>
@@ -18,11 +18,11 @@ namespace {
 constexpr int32_t kInvalidHandle = -4;  // the library's
 
 struct ZipCalls {
-  std::vector<bool> ownership;       // of the descriptors that archives were opened on
-  std::vector<std::string> filters;  // "PREFIX SUFFIX" of each iteration that was started
-  std::vector<void*> archives;       // and the archive that it was started on
-  std::vector<void*> open_cookies;   // of iterations that were started and not ended
-  bool no_iteration = false;         // none can be started, though there is an archive
+  std::vector<bool> ownership;       // whether archives own their descriptors
+  std::vector<std::string> filters;  // "PREFIX SUFFIX" of each started iteration
+  std::vector<void*> archives;       // the archive of each iteration
+  std::vector<void*> open_cookies;   // of iterations that have not ended
+  bool no_iteration = false;         // true: every start of an iteration fails
 } calls;
 
 template <typename Filter>
@@ -103,7 +103,7 @@ TEST_F(ZipCallsTest, ADescriptorWithAPathStaysTheCallers) {
   EXPECT_EQ(calls.ownership, std::vector<bool>({false}));
 }
 
-TEST_F(ZipCallsTest, AfterAnOpeningThatFailedThereIsNoArchive) {
+TEST_F(ZipCallsTest, AFailedOpeningLeavesNoArchive) {
   OpenPackage open(ToBytes("This is not a zip archive, but a text."));
   void* cookie = nullptr;
   EXPECT_NE(open.apk.StartIteration(&cookie, "", ""), 0);
@@ -128,7 +128,7 @@ TEST_F(ZipCallsTest, WithoutAWalkNoLibraryIsSignedAndTheResultIsTheSame) {
   EXPECT_EQ(calls.filters.back(), "lib/ .so");
 }
 
-TEST_F(ZipCallsTest, WithoutAWalkThereIsNoSignatureFile) {
+TEST_F(ZipCallsTest, WithoutAWalkNoSignatureFileIsFound) {
   const Package package = MakePackage();
   calls.no_iteration = true;
   OpenPackage open(package);
@@ -137,7 +137,7 @@ TEST_F(ZipCallsTest, WithoutAWalkThereIsNoSignatureFile) {
   EXPECT_EQ(log_.records(), Records());
 }
 
-TEST_F(ZipCallsTest, AWalkThatFindsNothingIsEndedAllTheSame) {
+TEST_F(ZipCallsTest, AWalkThatFindsNothingIsEndedToo) {
   Package package = MakePackage();
   package.Remove("META-INF/CERT.SF");
   OpenPackage open(package);

@@ -21,7 +21,7 @@ TEST(ExitStatus, OneWhenSomethingWasRefused) {
   const ProcessResult result = Simulated({probe.path()});
   EXPECT_EQ(result.status, 1);
   EXPECT_EQ(result.errors, "");
-  EXPECT_EQ(FirstLines(result, 2), Lines({"REFUSED  " + probe.path(),
+  EXPECT_EQ(FirstLines(result, 2), Lines({"REFUSED  " + probe.path() + "   it logged an error: a|5",
                                           "  ✗ package  not signed: it logged an error: a|5"}));
 }
 
@@ -42,7 +42,7 @@ TEST(ExitStatus, FourForAFileThatIsNotThere) {
   const ProcessResult result = Told({"/nowhere/base.apk"});
   EXPECT_EQ(result.status, 4);
   EXPECT_EQ(result.output,
-            "NOT LOOKED AT  /nowhere/base.apk\n"
+            "NOT LOOKED AT  /nowhere/base.apk   there is no such file\n"
             "  ✗ file  not looked at: there is no such file\n"
             "      Check the name; a relative one counts from the folder in which the tool is\n"
             "      run.\n"
@@ -92,9 +92,9 @@ TEST(ExitStatus, OneForADeviceOrAPipe) {
   for (const std::string& file : {pipe, std::string("/dev/zero")}) {
     const ProcessResult result = Told({"--timeout", "20", "--state", state.path(), file});
     EXPECT_EQ(result.status, 1);
-    EXPECT_EQ(
-        FirstLines(result, 2),
-        Lines({"REFUSED  " + file, "  ✗ file  not signed: it is a device, a pipe or a socket"}));
+    EXPECT_EQ(FirstLines(result, 2),
+              Lines({"REFUSED  " + file + "   it is a device, a pipe or a socket",
+                     "  ✗ file  not signed: it is a device, a pipe or a socket"}));
   }
 }
 
@@ -109,7 +109,8 @@ TEST(ExitStatus, ThreeWhenTheToolIsAnotherProgramThatDoesNothing) {
   const ProcessResult failed = Simulated({failing.path()});
   EXPECT_EQ(failed.status, 3);
   EXPECT_EQ(FirstLines(failed, 3),
-            Lines({"NOT SIMULATED  " + failing.path(), "  ✗ tool  it ended with status 1",
+            Lines({"NOT SIMULATED  " + failing.path() + "   it ended with status 1",
+                   "  ✗ tool  it ended with status 1",
                    "      Check --tool: apktoolkit ends with 0 for every file."}));
 }
 
@@ -213,9 +214,11 @@ TEST(ExitStatus, ThreeWhenLibrariesCannotBeWritten) {
       RunProcess({"bash", "-c", "trap '' XFSZ; ulimit -f 1; exec \"$@\"", "bash", "env",
                   "LC_ALL=C.UTF-8", SimulatorPath(), "--quiet", "--install", file});
   EXPECT_EQ(result.status, 3) << result.output;
-  EXPECT_EQ(result.output, "NOT SIMULATED  " + file + "\n");
+  EXPECT_EQ(
+      result.output.rfind("NOT SIMULATED  " + file + "   its libraries cannot be laid out: ", 0),
+      0U);
   EXPECT_NE(result.errors.find("its libraries cannot be laid out: "), std::string::npos);
-  EXPECT_NE(result.errors.find("/lib/arm64/liba.so: File too large"), std::string::npos);
+  EXPECT_NE(result.errors.find(" <install>/lib/arm64/liba.so: File too large"), std::string::npos);
 }
 
 TEST(ExitStatus, OneWhenALibraryCannotBeExtracted) {
@@ -227,11 +230,10 @@ TEST(ExitStatus, OneWhenALibraryCannotBeExtracted) {
   const ProcessResult quiet = Told({"--quiet", "--install", file});
   EXPECT_EQ(quiet.status, 1);
   EXPECT_EQ(quiet.output.substr(0, 13), "PARTLY SIGNED") << quiet.output;
-  EXPECT_NE(
-      Told({"--install", file})
-          .output.find(
-              "  ✗ lib/arm64/libfoo.so  not signed: --install cannot extract it from the package"),
-      std::string::npos);
+  EXPECT_NE(Told({"--install", file})
+                .output.find(
+                    "  ✗ lib/arm64/libfoo.so  not signed: it cannot be extracted from the package"),
+            std::string::npos);
 }
 
 TEST(ExitStatus, ThreeWhenTheStateCannotBeKept) {
@@ -295,6 +297,53 @@ TEST(ExitStatus, TwoWhenPageAndJournalAreOneFile) {
   EXPECT_EQ(result.status, 2);
   EXPECT_EQ(result.errors, "apktoolkit-sim: --journal and --html name the same file\n");
   EXPECT_EQ(access(file.c_str(), F_OK), -1);
+}
+
+TEST(ExitStatus, TwoWhenAReportWouldReplaceAFile) {
+  const Probe probe({"sign 3 0000"});
+  const std::string other = probe.folder().Write("other", ToBytes("<?xml version=\"1.0\"?>\n{}"));
+  const std::vector<Lines> kReports = {{"--junit", "JUnit report"}, {"--sarif", "SARIF log"}};
+  for (const Lines& report : kReports) {
+    for (const std::string& victim : {probe.path(), other}) {
+      const std::string before = ContentOf(victim);
+      const ProcessResult result = Simulated({report[0], victim, probe.path()});
+      EXPECT_EQ(result.status, 2);
+      EXPECT_EQ(result.output, "");
+      EXPECT_EQ(result.errors,
+                "apktoolkit-sim: " + report[0] + " " + victim +
+                    (victim == other ? " is there and holds no " + report[1] + " of apktoolkit-sim"
+                                     : " is a file that is to be looked at") +
+                    "; it is left alone\n");
+      EXPECT_EQ(ContentOf(victim), before);
+    }
+  }
+}
+
+TEST(ExitStatus, TwoWhenTwoOutputsAreOneFile) {
+  const Probe probe({"sign 3 0000"});
+  const std::string file = probe.folder() / "file";
+  const Lines options = {"--journal", "--html", "--junit", "--sarif"};
+  for (size_t i = 0; i < options.size(); ++i) {
+    for (size_t j = i + 1; j < options.size(); ++j) {
+      const ProcessResult result = Simulated({options[j], file, options[i], file, probe.path()});
+      EXPECT_EQ(result.status, 2);
+      EXPECT_EQ(result.errors,
+                "apktoolkit-sim: " + options[i] + " and " + options[j] + " name the same file\n");
+      EXPECT_EQ(access(file.c_str(), F_OK), -1);
+    }
+  }
+}
+
+TEST(ExitStatus, ThreeWhenAReportCannotBeWritten) {
+  const Probe probe({"sign 3 0100ab"});
+  const ProcessResult junit = Simulated({"--quiet", "--junit", "/dev/full", probe.path()});
+  EXPECT_EQ(junit.status, 3);
+  EXPECT_EQ(junit.errors,
+            "apktoolkit-sim: cannot write the JUnit report /dev/full: No space left on device\n");
+  const ProcessResult sarif = Simulated({"--quiet", "--sarif", "/nowhere/s", probe.path()});
+  EXPECT_EQ(sarif.status, 3);
+  EXPECT_EQ(sarif.errors,
+            "apktoolkit-sim: cannot write the SARIF log /nowhere/s: No such file or directory\n");
 }
 
 TEST(ExitStatus, IsTheHighestOfAllFiles) {

@@ -35,7 +35,7 @@ ProcessResult Told(const Lines& words) {
 
 TEST(Options, DefaultIsAHealthyPhone) {
   const Options options = Parsed({"a.apk"});
-  EXPECT_EQ(options.files, Lines({"a.apk"}));
+  EXPECT_EQ(options.files.names, Lines({"a.apk"}));
   EXPECT_EQ(options.run.phone.integrity, Lines({"1f"}));
   EXPECT_EQ(options.run.phone.sign_errno, 0);
   EXPECT_EQ(options.run.phone.verify_errno, ENOKEY);
@@ -71,7 +71,7 @@ TEST(Options, TrustTakesOneFileAtATime) {
   const Options options =
       Parsed({"--trust", "/dev/zero", "--trust", "/dev/null", "a.apk", "b.apk"});
   EXPECT_EQ(options.run.trust, Lines({"/dev/zero", "/dev/null"}));
-  EXPECT_EQ(options.files, Lines({"a.apk", "b.apk"}));
+  EXPECT_EQ(options.files.names, Lines({"a.apk", "b.apk"}));
 }
 
 TEST(Options, TheRestIsTakenAsItIs) {
@@ -85,7 +85,7 @@ TEST(Options, TheRestIsTakenAsItIs) {
   EXPECT_EQ(options.run.tool, "t");
   EXPECT_EQ(options.run.timeout, 0.5);
   EXPECT_EQ(options.run.runner, Lines({"emulator", "-L", "/root"}));
-  EXPECT_EQ(options.files, Lines({"-a.apk"}));
+  EXPECT_EQ(options.files.names, Lines({"-a.apk"}));
 }
 
 TEST(Options, WordsOfTheRunAreTakenAsTheyAre) {
@@ -101,8 +101,86 @@ TEST(Options, InstallTakesItsValueAfterAnEqualsSignAlone) {
   EXPECT_EQ(Parsed({"--install=arm", "a.apk"}).run.abi, InstalledAbi::kArm);
   const Options options = Parsed({"--install", "arm"});
   EXPECT_EQ(options.run.abi, InstalledAbi::kPreferred);
-  EXPECT_EQ(options.files, Lines({"arm"}));
-  EXPECT_EQ(Parsed({"--", "--install"}).files, Lines({"--install"}));
+  EXPECT_EQ(options.files.names, Lines({"arm"}));
+  EXPECT_EQ(options.run.install, InstallWhen::kAlways);
+  EXPECT_EQ(Parsed({"a.apk"}).run.install, InstallWhen::kAlone);
+  EXPECT_EQ(Parsed({"a.apk"}).run.abi, InstalledAbi::kPreferred);
+  EXPECT_EQ(Parsed({"--install=no", "a.apk"}).run.install, InstallWhen::kNever);
+  EXPECT_EQ(Parsed({"--install=no", "--install=arm", "a.apk"}).run.install, InstallWhen::kAlways);
+  EXPECT_EQ(Parsed({"--verify", "a.apk"}).run.install, InstallWhen::kNever);
+  EXPECT_EQ(Parsed({"--", "--install"}).files.names, Lines({"--install"}));
+}
+
+TEST(Options, FilesComeFromTheCommandLineOrAList) {
+  const Options named = Parsed({"a.apk"});
+  EXPECT_EQ(named.files.list, "");
+  EXPECT_FALSE(named.files.has_nul);
+  EXPECT_FALSE(named.files.is_recursive);
+  const Options listed = Parsed({"--files-from", "-", "-0", "--recursive"});
+  EXPECT_EQ(listed.files.names, Lines());
+  EXPECT_EQ(listed.files.list, "-");
+  EXPECT_TRUE(listed.files.has_nul);
+  EXPECT_TRUE(listed.files.is_recursive);
+}
+
+TEST(Options, MissingFileIsTold) {
+  EXPECT_EQ(LinesOf(Told({}).errors)[0], "FILE is required, or --files-from");
+}
+
+TEST(Options, InstallerIsAskedWhereItIsThereAboutAllPhonesOfTheTool) {
+  const Options options = Parsed({"a.apk"});
+  EXPECT_EQ(options.installer.use, InstallerUse::kAuto);
+  EXPECT_EQ(options.installer.levels.first, 27);
+  EXPECT_EQ(options.installer.levels.last, kNewestLevel);
+  EXPECT_EQ(options.installer.timeout, 30);
+  EXPECT_EQ(Parsed({"--installer=required", "a.apk"}).installer.use, InstallerUse::kRequired);
+  EXPECT_EQ(Parsed({"--installer", "off", "a.apk"}).installer.use, InstallerUse::kOff);
+  EXPECT_EQ(Parsed({"--installer=off", "--installer=auto", "a.apk"}).installer.use,
+            InstallerUse::kAuto);
+  EXPECT_EQ(Parsed({"--timeout", "2", "a.apk"}).installer.timeout, 2);
+}
+
+TEST(Options, ApiLevelsAreOneARangeOrAllFromOneOn) {
+  const auto levels = [](const std::string& text) {
+    const LevelRange range = Parsed({"--api", text, "a.apk"}).installer.levels;
+    return std::make_pair(range.first, range.last);
+  };
+  EXPECT_EQ(levels("28"), std::make_pair(28, 28));
+  EXPECT_EQ(levels("27-33"), std::make_pair(27, 33));
+  EXPECT_EQ(levels("30-"), std::make_pair(30, kNewestLevel));
+}
+
+TEST(Options, SignersAreDigestsInOneForm) {
+  const std::string digest(64, 'a');
+  std::string pairs = "AA";
+  for (int i = 1; i < 32; ++i) pairs += ":aA";
+  const Options options = Parsed({"--signer", digest, "--signer=" + pairs, "a.apk", "b.apk"});
+  EXPECT_EQ(options.gate.signers, Lines({digest, digest}));
+  EXPECT_EQ(options.files, Lines({"a.apk", "b.apk"}));
+  EXPECT_EQ(Parsed({"a.apk"}).gate.signers, Lines());
+}
+
+TEST(Options, OfTheGateAndItsReports) {
+  EXPECT_FALSE(Parsed({"a.apk"}).gate.refuses_warnings);
+  EXPECT_TRUE(Parsed({"--werror", "a.apk"}).gate.refuses_warnings);
+  const Options options = Parsed({"--junit", "j", "--sarif", "s", "a.apk"});
+  EXPECT_EQ(options.show.junit, "j");
+  EXPECT_EQ(options.show.sarif, "s");
+}
+
+TEST(Options, JournalOnStandardOutputIsJson) {
+  const Options options = Parsed({"--journal", "-", "a.apk"});
+  EXPECT_TRUE(options.show.json);
+  EXPECT_EQ(options.show.journal, "");
+  EXPECT_TRUE(Parsed({"--journal=-", "--json", "a.apk"}).show.json);
+  const Options file = Parsed({"--journal", "./-", "a.apk"});
+  EXPECT_FALSE(file.show.json);
+  EXPECT_EQ(file.show.journal, "./-");
+}
+
+TEST(Options, OwnToolIsTheOneBesideTheSimulator) {
+  EXPECT_TRUE(Parsed({"a.apk"}).run.is_own_tool);
+  EXPECT_FALSE(Parsed({"--tool", "t", "a.apk"}).run.is_own_tool);
 }
 
 TEST(Options, MistakesAreReportedWithStatusTwo) {
@@ -114,6 +192,24 @@ TEST(Options, MistakesAreReportedWithStatusTwo) {
                                        {"--zu-result", "x", "a.apk"},
                                        {"--zu-result", "2147483648", "a.apk"},
                                        {"--trust", "/nowhere/at-all", "a.apk"},
+                                       {"--installer=maybe", "a.apk"},
+                                       {"--installer=", "a.apk"},
+                                       {"--api", "", "a.apk"},
+                                       {"--api", "0", "a.apk"},
+                                       {"--api", "x", "a.apk"},
+                                       {"--api", "30-27", "a.apk"},
+                                       {"--api", "27-x", "a.apk"},
+                                       {"--api", "27-30-33", "a.apk"},
+                                       {"--api=-30", "a.apk"},
+                                       {"--api", "99999999999", "a.apk"},
+                                       {"--signer", "", "a.apk"},
+                                       {"--signer", "a.apk"},
+                                       {"--signer", std::string(63, 'a'), "a.apk"},
+                                       {"--signer", std::string(64, 'g'), "a.apk"},
+                                       {"--verify", "--werror", "a.apk"},
+                                       {"--verify", "--signer", std::string(64, 'a'), "a.apk"},
+                                       {"--verify", "--junit", "/nowhere/j", "a.apk"},
+                                       {"--verify", "--sarif", "/nowhere/s", "a.apk"},
                                        {"--timeout", "0", "a.apk"},
                                        {"--timeout", "-1", "a.apk"},
                                        {"--timeout", "nan", "a.apk"},
@@ -122,6 +218,11 @@ TEST(Options, MistakesAreReportedWithStatusTwo) {
                                        {"--jobs", "x", "a.apk"},
                                        {"--install=x86", "a.apk"},
                                        {"--install"},
+                                       {"--recursive"},
+                                       {"--files-from"},
+                                       {"--files-from", ""},
+                                       {"-0", "a.apk"},
+                                       {"--recursive", "--verify", "a.apk"},
                                        {"--quiet", "--verbose", "a.apk"},
                                        {"--integrity"}};
   for (const Lines& words : mistakes) {
@@ -154,11 +255,18 @@ TEST(Options, HelpNamesEveryOptionAndStatus) {
                            "--zu-result N",
                            "--state DIR",
                            "\nThe run:\n",
+                           "--recursive ",
+                           "--files-from LIST",
+                           "-0,--null ",
                            "--install [=ABI]",
                            "--strict ",
                            "--quiet ",
                            "--verbose ",
+                           "--signer SHA256",
+                           "--werror ",
                            "--journal FILE",
+                           "--junit FILE",
+                           "--sarif FILE",
                            "--html FILE",
                            "--json ",
                            "--jobs N",
@@ -184,7 +292,7 @@ TEST(Options, HelpFitsATerminalAndShowsDefaultsInOneWay) {
   EXPECT_EQ(help.find("=30"), std::string::npos);
   size_t defaults = 0;
   for (size_t at = 0; (at = help.find("[default: ", at)) != std::string::npos; ++at) ++defaults;
-  EXPECT_EQ(defaults, 9U);
+  EXPECT_EQ(defaults, 11U);
 }
 
 TEST(Options, VersionIsTheProjects) {

@@ -7,9 +7,10 @@
 #include "support/process.h"
 #include "support/simulation.h"
 
-// Runs apktoolkit-sim for somebody who reads UTF-8.
+// Runs apktoolkit-sim, without an installer and with packages left as they lie, for somebody who
+// reads UTF-8.
 inline ProcessResult Told(const Lines& words) {
-  Lines command = {"env", "LC_ALL=C.UTF-8", SimulatorPath()};
+  Lines command = {"env", "LC_ALL=C.UTF-8", SimulatorPath(), "--installer=off", "--install=no"};
   command.insert(command.end(), words.begin(), words.end());
   return RunProcess(command);
 }

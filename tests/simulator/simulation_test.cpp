@@ -10,11 +10,21 @@
 #include "simulator/simulated.h"
 #include "support/package.h"
 
+namespace {
+
+// What stands behind such a JAR in the line of the verdict.
+constexpr char kNotTrusted[] =
+    "   it is a plain JAR, and those are signed only when the kernel trusts them already (ENOKEY: "
+    "Required key not available)";
+
+}  // namespace
+
 TEST(Files, AreSetApartAndSummedUp) {
   const Probe good({"sign 3 0000"});
   const Probe bad({"verify 3"});
   const ProcessResult result = Simulated({good.path(), bad.path(), good.path()});
-  EXPECT_NE(result.output.find("\n\nNOT TRUSTED JAR  " + bad.path() + "\n"), std::string::npos)
+  EXPECT_NE(result.output.find("\n\nNOT TRUSTED JAR  " + bad.path() + kNotTrusted + "\n"),
+            std::string::npos)
       << result.output;
   EXPECT_EQ(LinesOf(result.output).back(), "3 files: 2 trusted JARs, 1 JAR not trusted");
 }
@@ -22,8 +32,9 @@ TEST(Files, AreSetApartAndSummedUp) {
 TEST(Files, AreVerdictsAloneWhenAsked) {
   const Probe good({"sign 3 0000"});
   const Probe bad({"verify 3"});
-  EXPECT_EQ(Simulated({"--quiet", good.path(), bad.path()}).output,
-            "TRUSTED JAR  " + good.path() + "\nNOT TRUSTED JAR  " + bad.path() + "\n");
+  EXPECT_EQ(
+      Simulated({"--quiet", good.path(), bad.path()}).output,
+      "TRUSTED JAR  " + good.path() + "\nNOT TRUSTED JAR  " + bad.path() + kNotTrusted + "\n");
 }
 
 // The first takes longest; what is told keeps the order of the command line.
@@ -36,9 +47,9 @@ TEST(Files, KeepTheirOrderWhenSeveralRunAtATime) {
   Lines words = {"--jobs", "4", "--quiet", "--journal", journal};
   words.insert(words.end(), files.begin(), files.end());
   const ProcessResult result = Simulated(words);
+  const std::string refused = "NOT TRUSTED JAR  " + quick.path() + kNotTrusted;
   EXPECT_EQ(LinesOf(result.output),
-            Lines({"TRUSTED JAR  " + slow.path(), "NOT TRUSTED JAR  " + quick.path(),
-                   "NOT TRUSTED JAR  " + quick.path(), "NOT TRUSTED JAR  " + quick.path()}));
+            Lines({"TRUSTED JAR  " + slow.path(), refused, refused, refused}));
   Lines started;
   std::string last_event;
   for (const Json& event : ParseJournal(ContentOf(journal))) {
@@ -125,7 +136,8 @@ TEST(Interruption, EndsTheToolAndTheSimulatorByTheSignal) {
     EXPECT_LT(run.seconds, 20) << "the tool sleeps for 60 seconds";
     EXPECT_EQ(kill(std::stoi(ContentOf(pid)), 0), -1) << "the tool has ended, too";
     const std::string start =
-        "NOT SIMULATED  " + slow.path() + "\n  ✗ tool  it was interrupted\n      Run it again.\n";
+        "NOT SIMULATED  " + slow.path() +
+        "   it was interrupted\n  ✗ tool  it was interrupted\n      Run it again.\n";
     EXPECT_EQ(run.output.substr(0, start.size()), start);
   }
 }
@@ -225,9 +237,62 @@ TEST(Page, OfAnInterruptedRunHasWhatWasDone) {
   EXPECT_EQ(run.ended_by, SIGTERM);
   const std::string text = ContentOf(page);
   EXPECT_NE(text.find("<bdi>" + good.path() + "</bdi>"), std::string::npos);
-  EXPECT_NE(text.find("<p>2 files: 1 trusted JAR, 1 not simulated</p>"), std::string::npos) << text;
+  EXPECT_NE(
+      text.find("<p>2 files: 1 trusted JAR, 1 not simulated; interrupted before 1 more file</p>"),
+      std::string::npos)
+      << text;
   EXPECT_NE(text.find("it was interrupted"), std::string::npos);
   EXPECT_NE(text.find("</html>\n"), std::string::npos);
+}
+
+// Each file has its case and its error, and the last two were never begun.
+TEST(Reports, OfAnInterruptedRunAreWholeAndNotGreen) {
+  const Probe good({"sign 3 0000"});
+  const Probe slow({"sign 3 0000", "pid", "sleep 60"});
+  const std::string junit = good.folder() / "junit.xml", sarif = good.folder() / "log.sarif";
+  const Interrupted run(slow.path() + ".pid",
+                        {SimulatorPath(), "--tool", PROBE_PATH, "--junit", junit, "--sarif", sarif,
+                         good.path(), slow.path(), "/never/1", "/never/2"});
+  EXPECT_EQ(run.ended_by, SIGTERM);
+  const std::string xml = ContentOf(junit);
+  EXPECT_NE(xml.find("tests=\"4\" failures=\"0\" errors=\"3\""), std::string::npos) << xml;
+  EXPECT_NE(xml.find("name=\"/never/2\">\n            <error type=\"interrupted\" "
+                     "message=\"NOT SIMULATED: it was interrupted\">"),
+            std::string::npos)
+      << xml;
+  EXPECT_NE(xml.find("</testsuites>\n"), std::string::npos);
+  const Json log = Json::parse(ContentOf(sarif), nullptr, false);
+  ASSERT_TRUE(log.is_object());
+  EXPECT_EQ(log["runs"][0]["artifacts"].size(), 4U);
+  EXPECT_EQ(log["runs"][0]["invocations"][0]["executionSuccessful"], false);
+  EXPECT_EQ(log["runs"][0]["invocations"][0]["toolExecutionNotifications"].size(), 3U);
+  ASSERT_EQ(log["runs"][0]["results"].size(), 3U);
+  for (const Json& result : log["runs"][0]["results"]) {
+    EXPECT_EQ(result["level"], "error");
+    EXPECT_EQ(result["ruleId"], "interrupted");
+  }
+}
+
+// An earlier green report must not outlive a run that could not begin.
+TEST(Reports, OfARunThatCannotBeginAreNotGreen) {
+  const Probe good({"sign 3 0000"});
+  const std::string junit = good.folder() / "junit.xml", sarif = good.folder() / "log.sarif";
+  const Lines reports = {"--junit", junit, "--sarif", sarif, good.path()};
+  ASSERT_EQ(Simulated(reports).status, 0);
+  EXPECT_NE(ContentOf(junit).find("failures=\"0\" errors=\"0\""), std::string::npos);
+  EXPECT_EQ(Json::parse(ContentOf(sarif))["runs"][0]["results"], Json::array());
+  Lines words = {"--tool", "/nowhere/tool"};
+  words.insert(words.end(), reports.begin(), reports.end());
+  const ProcessResult result = Told(words);
+  EXPECT_EQ(result.status, 3);
+  EXPECT_EQ(result.errors, "apktoolkit-sim: cannot run /nowhere/tool: No such file or directory\n");
+  EXPECT_NE(
+      ContentOf(junit).find("<error type=\"not-begun\" message=\"NOT SIMULATED: no file could "
+                            "be simulated: cannot run /nowhere/tool: No such file or "
+                            "directory\">"),
+      std::string::npos)
+      << ContentOf(junit);
+  EXPECT_EQ(Json::parse(ContentOf(sarif))["runs"][0]["results"][0]["ruleId"], "not-begun");
 }
 
 TEST(Simulation, FollowsLinksToTheFile) {
@@ -291,7 +356,7 @@ TEST(Simulation, SurvivesAFileThatShrinksAndGoesOnToTheNext) {
       "export ASAN_OPTIONS=\"$ASAN_OPTIONS:handle_sigbus=0\"\n"
       "cd \"$1\"; sim=$2; cp whole.apk base.apk\n"
       "(while [ ! -e end ]; do truncate -s 3000 base.apk; cp whole.apk base.apk; done) & loop=$!\n"
-      "for i in $(seq 30); do \"$sim\" --quiet base.apk good.apk >out; status=$?\n"
+      "for i in $(seq 30); do \"$sim\" --installer=off --quiet base.apk good.apk >out; status=$?\n"
       "  [ $status = 1 ] || [ $status = 0 ] || echo \"status $status\"\n"
       "  grep -q '^SIGNED  good.apk' out || cat out\ndone; touch end; wait $loop";
   const ProcessResult result =
@@ -369,7 +434,7 @@ TEST(Tool, RunsAsItIsOnAFileThatIsNoZip) {
   EXPECT_EQ(result.status, 1);
   EXPECT_EQ(result.errors, "");
   EXPECT_EQ(result.output, "REFUSED  " + file +
-                               "\n"
+                               "   it is a text and not an archive\n"
                                "  ✗ file  not signed: it is a text and not an archive\n"
                                "      Look into it: a failed download leaves its message so.\n"
                                "   1  error      OpenArchiveFd(3) [file: " +

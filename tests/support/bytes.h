@@ -1,4 +1,4 @@
-// Bytes, and what tests write them as.
+// Bytes, and ways to write them in tests.
 #pragma once
 
 #include <cstddef>

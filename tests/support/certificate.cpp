@@ -20,7 +20,7 @@ struct DigestFacts {
   int nid;
   const char* oid;
   const char* rsa_oid;
-  const char* info_prefix;  // what precedes the digest in a DigestInfo
+  const char* info_prefix;  // the start of the DigestInfo, before the digest
 };
 
 constexpr DigestFacts kDigests[] = {

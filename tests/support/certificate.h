@@ -1,8 +1,7 @@
-// Building X.509 certificates (RFC 5280 §4.1), good ones and every kind of bad one.
+// Builds X.509 certificates (RFC 5280 §4.1), good ones and every kind of bad one.
 //
-// Each field holds the DER that goes into its place, header included, so that a test changes a
-// certificate by assigning to a field. A field that is left unset is made from the keys and the
-// digest when the certificate is built.
+// Each field holds the DER for its place, header included. A test changes a certificate by
+// assigning to a field. If a field is left unset, Build makes it from the keys and the digest.
 #pragma once
 
 #include <optional>
@@ -12,31 +11,31 @@
 
 #include "support/der.h"
 
-// The digests that a signature can be made over, with the object identifiers that go with them.
+// The digests that a signature can be made over, and their object identifiers.
 enum class Digest { kMd5, kSha1, kSha256 };
 
 std::string DigestOid(Digest digest);        // of the digest itself
 std::string RsaSignatureOid(Digest digest);  // of RSA PKCS#1 v1.5 with it
 Bytes DigestOf(Digest digest, const Bytes& data);
-// PKCS#1 v1.5 signature by the RSA test key `key` (support/keys.h) over `data`; by an EC key, the
-// ECDSA signature.
+// The PKCS#1 v1.5 signature by the RSA test key `key` (support/keys.h) over `data`; for an EC key,
+// the ECDSA signature.
 Bytes SignWith(const std::string& key, Digest digest, const Bytes& data);
-// The encoded message of the data (RFC 8017 §9.2), which a signature is the root of, in `size`
-// bytes: with as much padding as there is room for, be it none; empty when it does not fit.
+// The encoded message of the data (RFC 8017 §9.2) in `size` bytes. The padding fills the room that
+// is left and may be empty. Empty if the DigestInfo does not fit.
 Bytes EncodedMessage(Digest digest, const Bytes& data, size_t size);
-// AlgorithmIdentifier with NULL parameters, or with those given.
+// An AlgorithmIdentifier with NULL or the given parameters.
 Bytes AlgorithmIdentifier(const std::string& oid, const Bytes& parameters = der::Null());
-// SubjectPublicKeyInfo of the test key, and one that holds any RSAPublicKey or other contents.
+// A SubjectPublicKeyInfo of the test key, and one with any RSAPublicKey or other contents.
 Bytes PublicKeyInfo(const std::string& key);
 Bytes PublicKeyInfoAround(const Bytes& public_key);
 
-// A Name of one attribute for each pair of object identifier and text, in UTF8Strings.
+// A Name with one attribute for each pair of object identifier and text, as UTF8Strings.
 Bytes Name(const std::vector<std::pair<std::string, std::string>>& attributes);
-// The Extension; a critical flag is written only when it is TRUE.
+// An Extension. The critical flag is written only if it is TRUE.
 Bytes Extension(const std::string& oid, const Bytes& value, bool critical = false);
 
 struct Certificate {
-  // The subject's key; the certificate is signed by it as well, unless `signing_key` says another.
+  // The subject's key. It also signs the certificate, unless `signing_key` names another key.
   std::string key = "rsa-2048";
   std::string signing_key;
   Digest digest = Digest::kSha256;
@@ -53,7 +52,7 @@ struct Certificate {
   Bytes issuer_unique_id;         // [1], or empty
   Bytes subject_unique_id;        // [2], or empty
   std::vector<Bytes> extensions;  // each an Extension; none: no [3]
-  Bytes tbs_tail;                 // whatever should follow
+  Bytes tbs_tail;                 // anything after the extensions
 
   std::optional<Bytes> tbs;  // instead of all the fields above
   std::optional<Bytes> signature_algorithm;

@@ -23,7 +23,7 @@ void PutChunkHeader(Bytes& out, uint16_t type, uint16_t header_length, size_t le
   Put32(out, static_cast<uint32_t>(length));
 }
 
-// Of UTF-8 that is in order. The C++ library's own conversion is deprecated, and newer ones warn.
+// Converts valid UTF-8. The C++ library's own conversion is deprecated, and newer libraries warn.
 std::u16string ToUtf16(const std::string& text) {
   std::u16string units;
   for (size_t at = 0; at < text.size();) {
@@ -37,7 +37,7 @@ std::u16string ToUtf16(const std::string& text) {
   return units;
 }
 
-// A length of the UTF-8 pool: one byte, or two of which the first has its highest bit set.
+// A length of the UTF-8 pool: one byte, or two bytes with the highest bit of the first set.
 void PutLength8(Bytes& out, size_t length) {
   if (length > 0x7f) out.push_back(static_cast<uint8_t>(0x80 | (length >> 8)));
   out.push_back(static_cast<uint8_t>(length & 0xff));
@@ -50,7 +50,7 @@ void PutString8(Bytes& out, const std::string& text) {
   out.push_back(0);
 }
 
-// A length of the UTF-16 pool: one unit, or two of which the first has its highest bit set.
+// A length of the UTF-16 pool: one unit, or two units with the highest bit of the first set.
 void PutString16(Bytes& out, const std::string& text) {
   const std::u16string units = ToUtf16(text);
   if (units.size() > 0x7fff) Put16(out, static_cast<uint16_t>(0x8000 | (units.size() >> 16)));
@@ -187,7 +187,7 @@ Bytes CompiledXml::Build() const {
   return Concat({out, pool, nodes_});
 }
 
-// The index of the text in the string pool, which gets it when it is new.
+// The index of the text in the string pool. A new text is added to the pool.
 uint32_t CompiledXml::Ref(const std::string& text) {
   const auto found = std::find(strings_.begin(), strings_.end(), text);
   const auto index = static_cast<uint32_t>(found - strings_.begin());

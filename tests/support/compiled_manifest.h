@@ -1,5 +1,5 @@
-// Writing Android's compiled XML, good and bad: a string pool, then one node after the other, as
-// they are called for. Nothing checks that elements nest.
+// Writes Android's compiled XML, good and bad: a string pool, then one node for each call. Nothing
+// checks that elements nest.
 #pragma once
 
 #include <cstdint>
@@ -8,14 +8,14 @@
 
 #include "support/der.h"
 
-// One attribute of an element. Names and texts are UTF-8 and may hold NUL. Three bytes may stand
-// for an unpaired surrogate, as U+D800 is ED A0 80.
+// One attribute of an element. Names and texts are UTF-8 and may hold NUL. Three bytes may encode
+// an unpaired surrogate: U+D800 is ED A0 80.
 struct XmlAttribute {
   std::string name;
   uint8_t type;            // of the typed value (Res_value)
-  std::string text;        // the string that raw value (and a string's data) refer to
-  bool has_raw = false;    // whether there is a raw value
-  uint32_t data = 0;       // the typed value of what is no string
+  std::string text;        // the string for the raw value (and for a string's data)
+  bool has_raw = false;    // whether it has a raw value
+  uint32_t data = 0;       // the typed value, unless it is a string
   std::string name_space;  // its URI; empty for none
   bool has_name = true;    // whether the name is in the string pool
 };
@@ -25,7 +25,7 @@ inline constexpr char kAndroidNamespace[] = "http://schemas.android.com/apk/res/
 XmlAttribute StringAttribute(const std::string& name, const std::string& text);
 XmlAttribute ReferenceAttribute(const std::string& name, uint32_t resource);
 XmlAttribute IntAttribute(const std::string& name, uint32_t value);
-// Its typed value says "string", but there is no raw value to be read.
+// Its typed value says "string", but its raw value is missing.
 XmlAttribute StringAttributeWithoutText(const std::string& name);
 // The same attribute in Android's namespace.
 XmlAttribute InAndroidNamespace(XmlAttribute attribute);
@@ -42,11 +42,11 @@ class CompiledXml {
   CompiledXml& End(const std::string& name);
   // A start and an end tag.
   CompiledXml& Element(const std::string& name, const std::vector<XmlAttribute>& attributes = {});
-  // A start tag that claims `count` attributes of size 0: all of them lie where the one is.
+  // A start tag that claims `count` attributes of size 0. All of them lie where this one does.
   CompiledXml& StartWithSizelessAttributes(const std::string& name, const XmlAttribute& attribute,
                                            uint16_t count);
   CompiledXml& Text(const std::string& text);
-  // A node with a header too short to be one: the document is bad from here on.
+  // A node whose header is too short. The document is bad from here on.
   CompiledXml& BadNode();
   // A start tag whose name is not in the string pool.
   CompiledXml& StartWithoutName();
@@ -67,5 +67,5 @@ class CompiledXml {
   Bytes nodes_;
 };
 
-// The manifest of a package of this name that asks for the secure-storage permission, or not.
+// The manifest of a package of this name. It may ask for the secure-storage permission.
 Bytes CompiledManifest(const std::string& package_name, bool secure_storage = false);

@@ -1,5 +1,5 @@
-// Writing DER (X.690), for the builders and for tests that need an element which no builder makes.
-// Nothing is checked: a test may nest and label elements as wrongly as it likes.
+// Writes DER (X.690), for the builders and for tests that need an element which no builder makes.
+// Nothing is checked: a test may nest and label elements wrongly.
 #pragma once
 
 #include <cstdint>
@@ -39,12 +39,12 @@ Bytes ContextPrimitive(uint8_t number, const Bytes& contents);
 
 Bytes Boolean(uint8_t value);
 Bytes Integer(uint64_t value);
-// An INTEGER of these very bytes.
+// An INTEGER with exactly these bytes.
 Bytes Integer(const Bytes& contents);
 Bytes BitString(const Bytes& contents, uint8_t unused_bits = 0);
 Bytes OctetString(const Bytes& contents);
 Bytes Null();
-// The element, and the contents alone, of the OBJECT IDENTIFIER with this dotted text.
+// The OBJECT IDENTIFIER with this dotted text: the whole element, and its contents alone.
 Bytes Oid(const std::string& dotted);
 Bytes OidContents(const std::string& dotted);
 

@@ -1,7 +1,7 @@
-// How journeys write down what happened to a phone during one run of the tool: a timeline is a text
-// with one line for each event, in order, so that timelines are joined with `+` and a difference is
-// shown line by line. Each function below makes the line of one event, every field of the journal's
-// record in it (docs/journal.md).
+// Journeys describe the events of one run of the tool on a phone as a timeline: a text with one
+// line for each event, in order. Timelines are joined with `+`, and a difference is shown line by
+// line. Each function below makes the line of one event, with every field of the journal's record
+// (docs/journal.md).
 #pragma once
 
 #include <initializer_list>
@@ -15,11 +15,11 @@ std::string Log(int priority, const std::string& text);
 std::string Integrity(const std::string& text);
 // The same, but there was no such file.
 std::string IntegrityMissing();
-// The tool had the kernel sign the open file `fd`. A refusal is an errno value.
+// The tool asked the kernel to sign the open file `fd`. A refusal is an errno value.
 std::string Sign(int fd, const std::string& path, const Bytes& payload, int refusal = 0);
-// The tool had the kernel verify the open file `fd`.
+// The tool asked the kernel to verify the open file `fd`.
 std::string Verify(int fd, const std::string& path, int refusal = 0);
-// The tool had libzu register `data` under `name`.
+// The tool asked libzu to register `data` under `name`.
 std::string Register(int fd, const std::string& path, const std::string& name, const Bytes& data,
                      int result = 0);
 std::string StandardOutput(const std::string& text);
@@ -27,15 +27,15 @@ std::string Exit(int status);
 
 std::string Timeline(std::initializer_list<std::string> parts);
 
-// What the kernel is handed with a package that is signed with the RSA test key, by hand: the
-// length 32 as two bytes, low byte first, and the SHA-256 digest of the modulus.
+// The payload for a package that is signed with the RSA test key, made by hand: the length 32 as
+// two bytes, low byte first, and the SHA-256 digest of the modulus.
 Bytes PackagePayload(const std::string& key = "rsa-2048");
 
 // The parts that most journeys share.
 
-// VeltSignJni: its first line, what happens to each library, its last line.
+// VeltSignJni: its first line, the events of each library, its last line.
 std::string LibraryStep(std::initializer_list<std::string> libraries = {});
-// One library that matched the manifest and was signed.
+// A library that matched the manifest and was signed.
 std::string SignedLibrary(const std::string& path, const Bytes& payload = PackagePayload());
 // VeltSign of a package that is good.
 std::string PackageStep(const std::string& path, const Bytes& payload = PackagePayload());

@@ -1,28 +1,28 @@
-// Memory exhaustion at will, and a look at what is freed.
+// Makes chosen allocations fail, and checks memory that is freed.
 //
 // A test program linked with -Wl,--wrap=malloc,--wrap=free sends the calls of its own objects here,
-// and on to the real functions; the platform's libraries and the sanitizers keep theirs.
+// and on to the real functions. The platform's libraries and the sanitizers keep theirs.
 #pragma once
 
 #include <cstddef>
 
-// While it lives, makes one call of malloc fail and watches the blocks that the others return. One
-// at a time.
+// While it lives, makes one call of malloc fail and watches the blocks of the other calls. Only one
+// may live at a time.
 class FailingMalloc {
  public:
-  // Fails call number `failing_call`, the first being 1; 0 fails none.
+  // Makes call number `failing_call` fail, counted from 1; 0 lets all succeed.
   explicit FailingMalloc(int failing_call = 0);
   ~FailingMalloc();
   FailingMalloc(const FailingMalloc&) = delete;
   FailingMalloc& operator=(const FailingMalloc&) = delete;
 
-  // How often malloc was called.
+  // The number of calls of malloc.
   int calls() const { return calls_; }
-  // Whether the call that is to fail was made.
+  // True if the call that must fail was made.
   bool failed() const { return failing_call_ != 0 && calls_ >= failing_call_; }
-  // Blocks returned and not yet freed.
+  // The blocks that were returned and not yet freed.
   int live() const;
-  // Blocks freed; and those among them that held other bytes than zeros at that time.
+  // The blocks that were freed; and those that held bytes other than zeros at that time.
   int freed() const { return freed_; }
   int freed_unwiped() const { return freed_unwiped_; }
 

@@ -19,8 +19,8 @@ namespace {
   abort();
 }
 
-// The one that the environment names, a workstation's, or a phone's.
-std::string TemporaryFolder() {
+// The directory that the environment names, a workstation's, or a phone's.
+std::string TemporaryDirectory() {
   if (const char* const named = getenv("TMPDIR"); named != nullptr) return named;
   return access("/tmp", W_OK) == 0 ? "/tmp" : "/data/local/tmp";
 }
@@ -30,7 +30,7 @@ int RemoveOne(const char* path, const struct stat*, int, FTW*) { return remove(p
 }  // namespace
 
 TempDir::TempDir(const std::string& parent) {
-  const std::string place = parent.empty() ? TemporaryFolder() : parent;
+  const std::string place = parent.empty() ? TemporaryDirectory() : parent;
   char* const resolved = realpath(place.c_str(), nullptr);
   if (resolved == nullptr) GiveUp(place);
   path_ = resolved + std::string("/apktoolkit-XXXXXX");
@@ -39,15 +39,15 @@ TempDir::TempDir(const std::string& parent) {
 }
 
 TempDir::~TempDir() {
-  constexpr int kOpenFolders = 8;
-  nftw(path_.c_str(), RemoveOne, kOpenFolders, FTW_DEPTH | FTW_PHYS);
+  constexpr int kOpenDirectories = 8;
+  nftw(path_.c_str(), RemoveOne, kOpenDirectories, FTW_DEPTH | FTW_PHYS);
 }
 
 std::string TempDir::File(const std::string& name) const {
   const std::string path = *this / name;
   for (size_t end = path_.size(); (end = path.find('/', end + 1)) != std::string::npos;) {
-    const std::string folder = path.substr(0, end);
-    if (mkdir(folder.c_str(), 0777) != 0 && errno != EEXIST) GiveUp(folder);
+    const std::string directory = path.substr(0, end);
+    if (mkdir(directory.c_str(), 0777) != 0 && errno != EEXIST) GiveUp(directory);
   }
   return path;
 }
@@ -70,7 +70,7 @@ std::string ContentOf(const std::string& path) {
   return {std::istreambuf_iterator<char>(file), {}};
 }
 
-// The system call itself: the C library has no name for it before API level 30.
+// The system call itself: before API level 30 the C library has no function for it.
 MemoryFile::MemoryFile(const Bytes& content, const std::string& name)
     : fd_(static_cast<int>(syscall(SYS_memfd_create, name.c_str(), MFD_CLOEXEC))),
       path_("/memfd:" + name + " (deleted)") {
@@ -83,7 +83,7 @@ MemoryFile::MemoryFile(const Bytes& content, const std::string& name)
 
 MemoryFile::~MemoryFile() { close(fd_); }
 
-// Kept far above: the lowest free number may be one that another of these makes free.
+// Keeps the file under a number far above: another FreeDescriptor may free the lowest number.
 FreeDescriptor::FreeDescriptor(int fd) : fd_(fd), kept_(dup2(fd, 100 + fd)) { close(fd); }
 
 FreeDescriptor::~FreeDescriptor() {

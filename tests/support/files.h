@@ -1,27 +1,27 @@
-// Folders and files of a test's own, on disk and in memory, gone when the test is over. What cannot
-// be made aborts the program.
+// Directories and files of a test's own, on disk and in memory. They are removed when the test is
+// over. If one cannot be made, the program aborts.
 #pragma once
 
 #include <string>
 
 #include "support/bytes.h"
 
-// A new empty folder.
+// A new empty directory.
 class TempDir {
  public:
-  // Below the folder for temporary files, or below `parent`.
+  // Makes it below the directory for temporary files, or below `parent`.
   explicit TempDir(const std::string& parent = {});
   ~TempDir();
   TempDir(const TempDir&) = delete;
   TempDir& operator=(const TempDir&) = delete;
 
-  // Resolved, without a "/" at the end.
+  // The resolved path, without a "/" at the end.
   const std::string& path() const { return path_; }
-  // The path of `name` in the folder.
+  // The path of `name` in the directory.
   std::string operator/(const std::string& name) const { return path_ + "/" + name; }
-  // The same, and makes the folders on the way to it.
+  // The same; also makes the directories above it.
   std::string File(const std::string& name) const;
-  // Writes a file, and makes the folders on the way to it. Returns its path.
+  // Writes a file, and makes the directories above it. Returns its path.
   std::string Write(const std::string& name, const Bytes& content) const;
 
  private:
@@ -30,17 +30,17 @@ class TempDir {
 
 void WriteFile(const std::string& path, const Bytes& content);
 
-// What the file holds; nothing when it cannot be read.
+// The file's content; empty if it cannot be read.
 std::string ContentOf(const std::string& path);
 
-// A file on disk, in a folder of its own.
+// A file on disk, in a directory of its own.
 class DiskFile {
  public:
-  explicit DiskFile(const Bytes& content) : path_(folder_.Write("file", content)) {}
+  explicit DiskFile(const Bytes& content) : path_(directory_.Write("file", content)) {}
   const std::string& path() const { return path_; }
 
  private:
-  TempDir folder_;
+  TempDir directory_;
   std::string path_;
 };
 
@@ -53,7 +53,7 @@ class MemoryFile {
   MemoryFile& operator=(const MemoryFile&) = delete;
 
   int fd() const { return fd_; }
-  // What its descriptor resolves to.
+  // The path that its descriptor resolves to.
   std::string path() const { return path_; }
 
  private:

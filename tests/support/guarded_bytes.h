@@ -1,5 +1,4 @@
-// Bytes that end where memory ends: reading on is a fault in every build, with and without a
-// sanitizer.
+// Bytes that end where memory ends: reading on crashes in every build, with or without a sanitizer.
 #pragma once
 
 #include <sys/mman.h>

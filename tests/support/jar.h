@@ -1,5 +1,5 @@
-// Writing the texts of a signed JAR (JAR File Specification, "Signed JAR File"): the manifest and
-// the signature file, with the digests in them.
+// Writes the texts of a signed JAR (JAR File Specification, "Signed JAR File"): the manifest and
+// the signature file, with their digests.
 #pragma once
 
 #include <string>
@@ -10,11 +10,11 @@
 // The standard alphabet, with padding.
 std::string Base64Encode(const Bytes& data);
 
-// The digest of the data in base64; `attribute` says which: "MD5-Digest", "SHA1-Digest" or
-// "SHA-256-Digest". Of any other attribute, the text "AAAA".
+// The digest of the data in base64, by `attribute`: "MD5-Digest", "SHA1-Digest" or
+// "SHA-256-Digest". For any other attribute, the text "AAAA".
 std::string DigestText(const std::string& attribute, const Bytes& data);
 
-// A manifest or signature file, line by line, each ended by CR LF and cut at 72 bytes.
+// A manifest or signature file, line by line. Each line ends with CR LF and is cut at 72 bytes.
 class JarText {
  public:
   // Starts with the main section's first line, such as "Manifest-Version: 1.0".
@@ -22,11 +22,11 @@ class JarText {
   static JarText SignatureFile();
 
   JarText& Attribute(const std::string& name, const std::string& value);
-  // One digest attribute for each name in `attributes`.
+  // Adds one digest attribute for each name in `attributes`.
   JarText& Digests(const std::vector<std::string>& attributes, const Bytes& data,
                    const std::string& suffix = "");
   JarText& EndSection();
-  // A whole section: "Name", the digests, and its end.
+  // Adds a whole section: "Name", the digests, and its end.
   JarText& Section(const std::string& name, const std::vector<std::string>& attributes,
                    const Bytes& data);
 
@@ -36,6 +36,7 @@ class JarText {
   std::string text_;
 };
 
-// The signature file over this manifest: a "-Digest-Manifest" for each of the digest attributes.
+// The signature file over this manifest, with a "-Digest-Manifest" for each of the digest
+// attributes.
 std::string SignatureFileText(const std::string& manifest,
                               const std::vector<std::string>& attributes);

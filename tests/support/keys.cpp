@@ -11,17 +11,17 @@
 
 namespace {
 
-// On a phone the keys lie beside the program or, where a suite keeps programs of several processors
-// apart, one folder above it. (Not by readlink: tests have the linker wrap it.)
+// On a phone, the keys lie beside the program. A suite that separates programs by processor has
+// them one directory above. (Not found by readlink: tests have the linker wrap it.)
 std::string KeysDirectory() {
   const std::string keys = TEST_KEYS_DIR;
   if (keys[0] == '/') return keys;
   char program[PATH_MAX] = {};
   if (readlinkat(AT_FDCWD, "/proc/self/exe", program, sizeof(program) - 1) < 0) return keys;
-  std::string folder = program;
-  folder.erase(folder.rfind('/'));
-  if (access((folder + "/" + keys).c_str(), X_OK) != 0) folder.erase(folder.rfind('/'));
-  return folder + "/" + keys;
+  std::string directory = program;
+  directory.erase(directory.rfind('/'));
+  if (access((directory + "/" + keys).c_str(), X_OK) != 0) directory.erase(directory.rfind('/'));
+  return directory + "/" + keys;
 }
 
 }  // namespace

@@ -1,4 +1,4 @@
-// The fixed test keys of tests/support/keys, as the platform's libcrypto holds them.
+// The fixed test keys of tests/support/keys, as objects of the platform's libcrypto.
 #pragma once
 
 #include <openssl/bn.h>
@@ -11,13 +11,13 @@
 struct FreeBignum {
   void operator()(BIGNUM* number) const { BN_free(number); }
 };
-// A number of libcrypto's that is freed with its owner.
+// A libcrypto number that its owner frees.
 using Bignum = std::unique_ptr<BIGNUM, FreeBignum>;
 
 // The path of the PEM file of key `name`, such as "rsa-2048".
 std::string TestKeyPath(const std::string& name);
 
-// The key `name`; loaded once and kept for the life of the program. Aborts when there is none.
+// The key `name`, loaded once and kept for the life of the program. Aborts if it does not exist.
 EVP_PKEY* TestKey(const std::string& name);
 
 // The same, as an RSA key.

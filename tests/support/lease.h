@@ -1,5 +1,5 @@
-// A write lease on a file (fcntl, F_SETLEASE), whose holder gives it up some time after another
-// process, or this one, opens the file. Until then such an open waits, or fails with EWOULDBLOCK.
+// A write lease on a file (fcntl, F_SETLEASE). Its holder gives it up some time after another
+// process, or this one, opens the file. Until then an open waits, or fails with EWOULDBLOCK.
 #pragma once
 
 #include <fcntl.h>
@@ -13,7 +13,7 @@
 class Lease {
  public:
   explicit Lease(const std::string& path) : fd_(open(path.c_str(), O_RDWR | O_CLOEXEC)) {
-    signal(SIGIO, SIG_IGN);  // by which the kernel tells the holder
+    signal(SIGIO, SIG_IGN);  // the kernel's signal to the holder
     is_held_ = fcntl(fd_, F_SETLEASE, F_WRLCK) == 0;
     if (is_held_) holder_ = std::thread([this] { GiveUpWhenAsked(); });
   }
@@ -25,14 +25,14 @@ class Lease {
   Lease(const Lease&) = delete;
   Lease& operator=(const Lease&) = delete;
 
-  // False where the file system knows no leases.
+  // False if the file system has no leases.
   bool IsHeld() const { return is_held_; }
   bool WasGivenUp() const { return was_given_up_; }
 
  private:
   void GiveUpWhenAsked() {
     while (!is_over_ && fcntl(fd_, F_GETLEASE) == F_WRLCK) usleep(1000);
-    usleep(100000);  // the holder has something to finish
+    usleep(100000);  // the holder finishes its work
     was_given_up_ = !is_over_;
     fcntl(fd_, F_SETLEASE, F_UNLCK);
   }

@@ -1,4 +1,4 @@
-// Appending little-endian numbers, as zip archives and compiled XML have them.
+// Appends little-endian numbers, which zip archives and compiled XML use.
 #pragma once
 
 #include <cstdint>

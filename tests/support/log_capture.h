@@ -1,8 +1,8 @@
-// Catches what the code under test writes to the Android log.
+// Catches the Android log of the code under test.
 //
-// The test program defines __android_log_print itself, so that records of the tool, and of the
-// platform libraries under it, arrive here and not on standard error. Only records with the tool's
-// tag are kept; they are kept while a LogCapture lives, in order.
+// The test program defines __android_log_print itself, so that the records of the tool, and of the
+// platform libraries under it, come here and not to standard error. A LogCapture keeps the records
+// with the tool's tag, in order, while it lives.
 #pragma once
 
 #include <string>
@@ -16,7 +16,7 @@ struct LogRecord {
 bool operator==(const LogRecord& a, const LogRecord& b);
 std::ostream& operator<<(std::ostream& out, const LogRecord& record);
 
-// One at a time; the newest record is the last.
+// Only one may live at a time. The newest record is the last.
 class LogCapture {
  public:
   LogCapture();
@@ -25,7 +25,7 @@ class LogCapture {
   LogCapture& operator=(const LogCapture&) = delete;
 
   const std::vector<LogRecord>& records() const { return records_; }
-  // Forgets what was caught so far.
+  // Forgets all records so far.
   void Clear() { records_.clear(); }
 
  private:
@@ -33,7 +33,7 @@ class LogCapture {
   std::vector<LogRecord> records_;
 };
 
-// Expected records, as tests write them: EXPECT_EQ(log.records(), Records({Error("…\n")})).
+// Expected records in a test: EXPECT_EQ(log.records(), Records({Error("…\n")})).
 using Records = std::vector<LogRecord>;
 inline LogRecord Info(std::string text) { return {4, std::move(text)}; }
 inline LogRecord Error(std::string text) { return {6, std::move(text)}; }

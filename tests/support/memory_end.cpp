@@ -13,9 +13,9 @@ namespace {
 
 constexpr size_t kRoom = 1 << 20;
 
-// kRoom bytes before it are for the block.
+// The block lies in the kRoom bytes before it.
 uint8_t* memory_end = nullptr;
-// The size of the block that the next operator new of that size is to put there; 0: none.
+// The size of the block that operator new must put there next; 0: no block.
 size_t size_at_end = 0;
 
 void MakeMemory() {

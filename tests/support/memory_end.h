@@ -1,13 +1,13 @@
-// Memory that ends where a block ends, for readers that no sanitizer sees: reading on is a fault
-// for any code.
+// Memory that ends where a block ends, for readers that no sanitizer sees: reading on crashes any
+// code.
 //
 // A program that links this file (target `memory_end`) has its operator new replaced.
 #pragma once
 
 #include <cstddef>
 
-// Has the next block of exactly `size` bytes (at most 1 MiB) that operator new is asked for end
-// where memory ends, but for what is missing to a multiple of 4. One block at a time.
+// Puts the next block of exactly `size` bytes (at most 1 MiB) from operator new at the end of
+// memory. Up to 3 bytes may follow it, to a multiple of 4. One block at a time.
 void PutNextBlockAtMemoryEnd(size_t size);
-// False, and not asked again, unless the block was put there.
+// True if the block was put there. If not, forgets the request.
 bool WasPutAtMemoryEnd();

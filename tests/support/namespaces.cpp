@@ -6,7 +6,7 @@
 
 namespace {
 
-// The mounts of a namespace of one's own; whoever is not root needs a user namespace for it.
+// A mount namespace of its own. Users other than root also need a user namespace.
 const char* Namespaces() { return geteuid() == 0 ? "-m" : "-Urm"; }
 
 }  // namespace

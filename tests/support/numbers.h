@@ -1,4 +1,4 @@
-// The integers' operands: made of limbs, drawn at random, and read back as GMP holds them.
+// The integers' operands: made of limbs, drawn at random, and converted to GMP's numbers.
 #pragma once
 
 #include <gmpxx.h>
@@ -20,7 +20,7 @@ inline void Set(mpi* X, const Limbs& limbs, int sign = 1) {
   X->s = sign;
 }
 
-// A number of the tests' own; least significant limb first.
+// A number made of these limbs, least significant limb first.
 struct Number : mpi_local {
   explicit Number(const Limbs& limbs = {}, int sign = 1) { Set(this, limbs, sign); }
 };
@@ -44,7 +44,7 @@ inline Limbs LimbsOf(const mpz_class& z) {
 
 inline mpz_class PowerOfTwo(unsigned long exponent) { return mpz_class(1) << exponent; }
 
-// Operands that are random, or made of the limbs at which carries, borrows and estimates turn.
+// Operands that are random, or made of limbs that provoke carries, borrows and wrong estimates.
 class Operands {
  public:
   uint32_t Below(uint32_t bound) { return static_cast<uint32_t>(random_() % bound); }
@@ -57,7 +57,7 @@ class Operands {
     return Below(2) == 0 ? static_cast<uint32_t>(random_()) : kEdges[Below(std::size(kEdges))];
   }
 
-  // 0 to `max` limbs: random, mixed, or all alike; now and then with zero limbs at the top.
+  // 0 to `max` limbs: random, mixed, or all equal; sometimes with zero limbs at the top.
   Limbs Magnitude(uint32_t max) {
     Limbs limbs(Below(max + 1));
     const uint32_t kind = Below(3);
@@ -72,7 +72,7 @@ class Operands {
   std::mt19937 random_;
 };
 
-// Which arguments of an operation X op= A, B are the same number.
+// The arguments of an operation X op= A, B that are the same number.
 enum Alias { kNone, kXIsA, kXIsB, kAIsB, kAllOne, kAliases };
 
 struct Aliased {
@@ -89,7 +89,8 @@ struct Aliased {
   }
 };
 
-// Calls `operation`, which returns a result code, with each of its allocations failing in turn.
+// Calls `operation`, which returns a result code, once for each of its allocations, and makes that
+// allocation fail.
 template <typename Operation>
 void ExpectNoMemoryAtEveryAllocation(const Operation& operation) {
   for (int call = 1;; ++call) {

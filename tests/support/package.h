@@ -1,9 +1,9 @@
-// Making whole packages and JARs: entries, the manifest that lists them, the signature file and the
+// Makes whole packages and JARs: entries, the manifest that lists them, the signature file and the
 // signature block.
 //
-// A package is made in two steps, so that a test can come between them: `MakePackage` signs, then
-// `Package` gives access to every entry (to tamper with it, remove it or add one), then `Build` or
-// `WriteTo` makes the archive.
+// A package is made in steps, so that a test can come between them. `MakePackage` signs; `Package`
+// gives access to every entry, to tamper with it, remove it or add one; `Build` or `WriteTo` makes
+// the archive.
 #pragma once
 
 #include <functional>
@@ -18,13 +18,15 @@
 inline constexpr char kManifestName[] = "META-INF/MANIFEST.MF";
 inline constexpr char kAndroidManifestName[] = "AndroidManifest.xml";
 
-// What to sign, and how. The defaults make a good package with a dex file and one native library.
+// The contents and the signature. The defaults make a good package with a dex file and one native
+// library.
 struct PackageOptions {
   std::string package_name = "com.example.app";
   bool secure_storage = false;
-  // Instead of the compiled manifest that the two fields above make; empty bytes: no entry (a JAR).
+  // Replaces the compiled manifest of the two fields above. Empty bytes leave the entry out (a
+  // JAR).
   std::optional<Bytes> android_manifest;
-  // The entries beside the Android manifest, in their order in the archive.
+  // The entries beside the Android manifest, in the order of the archive.
   std::vector<ZipItem> entries = {{"classes.dex", ToBytes("dex\n035")},
                                   {"lib/arm64-v8a/libfoo.so", ToBytes("\177ELF foo")}};
 
@@ -35,10 +37,10 @@ struct PackageOptions {
   std::string base_name = "META-INF/CERT";
   std::string block_extension = ".RSA";
 
-  // Each gets the text that was made, and gives the one to be signed.
+  // Each gets the text that was made, and returns the text to sign.
   std::function<std::string(const std::string&)> edit_manifest;
   std::function<std::string(const std::string&)> edit_signature_file;
-  // Key, digest and faults of the block.
+  // The key, digest and faults of the block.
   SignatureBlock block;
 };
 
@@ -46,7 +48,7 @@ class Package {
  public:
   std::vector<ZipItem> items;
 
-  // The first entry of the name. Aborts when there is none.
+  // The first entry of this name. Aborts if none has it.
   ZipItem& Item(const std::string& name);
   void Remove(const std::string& name);
   // Flips one bit in the middle of the entry's data, after signing.
@@ -58,14 +60,14 @@ class Package {
 
 Package MakePackage(const PackageOptions& options = {});
 
-// What makes a plain JAR: all of it but the Android manifest.
+// Options for a plain JAR: everything but the Android manifest.
 PackageOptions PlainJar();
-// What makes a package with these entries beside the Android manifest and a dex file.
+// Options for a package with these entries beside the Android manifest and a dex file.
 PackageOptions WithLibraries(const std::vector<ZipItem>& libraries);
-// What makes a good package with a native library and no dex file.
+// Options for a good package with a native library and no dex file.
 PackageOptions WithoutDex();
-// What makes a good package with this text for its manifest.
+// Options for a good package with this text as its manifest.
 PackageOptions WithManifest(const std::string& text);
 
-// The big-endian modulus of the RSA test key: the manufacturer key of what is signed with it.
+// The big-endian modulus of the RSA test key: the manufacturer key of packages that it signs.
 Bytes ModulusOf(const std::string& key);

@@ -1,12 +1,12 @@
 # shellcheck shell=bash
 #
-# Recipes for packages and their signers, made with the tools that developers make them with; for
-# scripts/demo and tests/journeys/make_golden_packages to source.
+# Recipes for packages and their signers, with the tools that developers use. scripts/demo and
+# tests/journeys/make_golden_packages source this file.
 
 recipes_dir=$(cd "$(dirname "${BASH_SOURCE[0]}")" && pwd)
 
-# make_unsigned_package APK: the example package of vault/, compiled and packed: its manifest, one
-# class and one native library for two kinds of processor.
+# make_unsigned_package APK: compiles and packs the example package of vault/: its manifest, one
+# class, and one native library for two kinds of processor.
 make_unsigned_package() {
   local apk=$1 sources=$recipes_dir/vault work
   work=$(mktemp -d)
@@ -19,7 +19,7 @@ make_unsigned_package() {
   rm -r "$work"
 }
 
-# put_android_manifest APK MANIFEST: makes the package anew, of this manifest compiled and nothing else.
+# put_android_manifest APK MANIFEST: makes the package anew, with only this manifest, compiled.
 put_android_manifest() {
   aapt package -f -M "$2" -F "$1" -I /usr/share/android-framework-res/framework-res.apk
 }
@@ -29,7 +29,8 @@ compile_library() {  # TARGET LIBRARY
     "$recipes_dir/vault/vault.c"
 }
 
-# put_entries APK DIRECTORY ENTRY...: packs files of the directory, in place of entries so named.
+# put_entries APK DIRECTORY ENTRY...: packs files of the directory in place of the entries of these
+# names.
 put_entries() {
   local apk directory=$2
   apk=$(realpath "$1")
@@ -43,8 +44,8 @@ test_key() {
   echo "$recipes_dir/keys/$1.pem"
 }
 
-# make_signer KEY DIRECTORY: a self-signed certificate KEY.pem for the fixed test key, and the key
-# as apksigner (KEY.pk8) and jarsigner (KEY.p12, alias cert, password android) take it.
+# make_signer KEY DIRECTORY: makes a self-signed certificate KEY.pem for the fixed test key, and the
+# key in the forms for apksigner (KEY.pk8) and jarsigner (KEY.p12, alias cert, password android).
 make_signer() {
   local key out=$2/$1
   key=$(test_key "$1")

@@ -66,7 +66,7 @@ int __real_usleep(useconds_t microseconds);
 ssize_t __real_fgetxattr(int fd, const char* name, void* value, size_t size);
 ssize_t __real_readlink(const char* path, char* buffer, size_t size);
 
-// Nothing that is linked with a Phone makes files by open(), so there is no mode to pass on.
+// Test programs with a Phone make no files by open(), so no mode is passed on.
 int __wrap_open(const char* path, int flags, ...) {
   if (phone == nullptr) return __real_open(path, flags);
   if (phone->before_open) phone->before_open(path, flags);
@@ -90,7 +90,7 @@ ssize_t __wrap___read_chk(int fd, void* buffer, size_t size, size_t /*room*/) {
   return __wrap_read(fd, buffer, size);
 }
 
-// What open is called in a build with _FORTIFY_SOURCE, as every platform tree has.
+// The name of open in a build with _FORTIFY_SOURCE, as in every platform tree.
 int __wrap___open_2(const char* path, int flags) { return __wrap_open(path, flags); }
 
 FILE* __wrap_fopen(const char* path, const char* mode) {

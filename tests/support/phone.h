@@ -1,9 +1,10 @@
-// What only the phone has, inside the test program: the kernel's integrity feature and libzu.
+// The parts that only a phone has, inside the test program: the kernel's integrity feature and
+// libzu.
 //
-// A program that links this file and asks the linker to wrap open, read, fcntl, fopen, usleep,
-// fgetxattr and readlink, and the checked forms of open, read and readlink (target `phone` does),
-// has a Phone to set up and to read afterwards. Without a living Phone every wrapped call goes to
-// the real system, and libzu refuses.
+// A program that links this file must have the linker wrap open, read, fcntl, fopen, usleep,
+// fgetxattr and readlink, and the checked forms of open, read and readlink (target `phone` does
+// that). It then has a Phone to set up and to read afterwards. While no Phone lives, every wrapped
+// call goes to the real system, and libzu refuses.
 #pragma once
 
 #include <cstdint>
@@ -19,22 +20,21 @@ struct Phone {
   Phone(const Phone&) = delete;
   Phone& operator=(const Phone&) = delete;
 
-  // A healthy phone, to be changed by the test.
-  // What the integrity file holds, one text an opening, the last of which repeats; kNoFile: there
-  // is none at that opening.
+  // A healthy phone; the test changes it. The texts of the integrity file, one for each opening.
+  // The last text repeats. kNoFile means that this opening fails.
   std::deque<std::string> integrity = {"1f\n"};
   static constexpr char kNoFile[] = "no file";
   int sign_errno = 0;             // 0: the kernel signs
   int verify_errno = 0;           // 0: the kernel trusts every file
-  int zu_result = 0;              // what libzu answers
-  int zu_attribute_size = -1;     // of "user.zu", on every file; -1: there is none
+  int zu_result = 0;              // the answer of libzu
+  int zu_attribute_size = -1;     // of "user.zu", on every file; -1: missing
   std::vector<int> nameless_fds;  // descriptors whose path cannot be resolved
-  // What fcntl answers to a request to sign or to verify that is in order.
+  // The answer of fcntl to a valid request to sign or to verify.
   int kernel_result = 0;
 
   // Called before the integrity file is opened: after all checks, and before the kernel signs.
   std::function<void()> before_integrity;
-  // Called before each open(), and after each that succeeded.
+  // Called before each open(), and after each successful one.
   std::function<void(const char* path, int flags)> before_open;
   std::function<void(const char* path, int fd)> after_open;
   // The errno that an open() fails with; 0: the real system answers.
@@ -43,14 +43,14 @@ struct Phone {
   std::function<void(int fd)> before_read;
   std::function<void(int fd)> after_read;
 
-  // Called after each event that has a descriptor, while that is still open.
+  // Called after each event with a descriptor, while the descriptor is still open.
   std::function<void(int fd, const std::string& event)> witness;
 
-  // What the code under test did, in the order in which it did it: "integrity PATH", "sleep
-  // MICROSECONDS", "sign FD PAYLOAD-HEX", "verify FD", "register FD NAME DATA-HEX".
+  // The actions of the code under test, in order: "integrity PATH", "sleep MICROSECONDS", "sign FD
+  // PAYLOAD-HEX", "verify FD", "register FD NAME DATA-HEX".
   std::vector<std::string> events;
-  // How many files other than an integrity file fopen was asked for.
+  // The number of other files than an integrity file that fopen opened.
   int other_fopens = 0;
-  // The attributes that were asked for: "FD NAME VALUE-IS-NULL SIZE".
+  // The attributes that were read: "FD NAME VALUE-IS-NULL SIZE".
   std::vector<std::string> attributes;
 };

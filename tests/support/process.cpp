@@ -27,7 +27,8 @@ bool Redirect(int number, const std::string& path, int flags) {
                      Redirect(STDOUT_FILENO, output, O_WRONLY | O_CREAT) &&
                      Redirect(STDERR_FILENO, errors, O_WRONLY | O_CREAT) &&
                      (directory.empty() || chdir(directory.c_str()) == 0);
-  // What this process was started with, such as ctest's log, would move the command's own numbers.
+  // Descriptors that this process inherited, such as ctest's log, would change the command's
+  // numbers.
   closefrom(STDERR_FILENO + 1);
   if (ready) execvp(arguments[0], arguments.data());
   perror(arguments[0]);
@@ -37,9 +38,9 @@ bool Redirect(int number, const std::string& path, int flags) {
 }  // namespace
 
 ProcessResult RunProcess(const std::vector<std::string>& command, const std::string& directory) {
-  const TempDir folder;
-  const std::string output = folder / "output";
-  const std::string errors = folder / "errors";
+  const TempDir streams;
+  const std::string output = streams / "output";
+  const std::string errors = streams / "errors";
   const pid_t child = fork();
   if (child == 0) Become(command, directory, output, errors);
   int status = 0;

@@ -1,4 +1,4 @@
-// Running programs.
+// Runs programs.
 #pragma once
 
 #include <string>
@@ -10,7 +10,7 @@ struct ProcessResult {
   std::string errors;
 };
 
-// Runs a program, found through PATH when its name has no "/", in the folder `directory` (empty: in
-// this one).
+// Runs a program in `directory`, or in this process's directory if that is empty. A program's name
+// without a "/" is looked up in PATH.
 ProcessResult RunProcess(const std::vector<std::string>& command,
                          const std::string& directory = {});

@@ -1,4 +1,4 @@
-// RSA keys with both halves, their contexts loaded, and the blocks that signatures carry.
+// RSA keys with both halves, their loaded contexts, and the blocks that signatures carry.
 #pragma once
 
 #include <gmpxx.h>
@@ -32,7 +32,7 @@ inline mpz_class ToNumber(const Bytes& bytes) {
   return number;
 }
 
-// One of the fixed keys; libcrypto holds its private half.
+// One of the fixed keys. libcrypto holds its private half.
 struct FixedKey {
   explicit FixedKey(const std::string& name)
       : rsa(TestRsaKey(name)),

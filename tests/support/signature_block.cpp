@@ -10,7 +10,7 @@ constexpr char kRsaEncryption[] = "1.2.840.113549.1.1.1";
 constexpr char kContentType[] = "1.2.840.113549.1.9.3";
 constexpr char kMessageDigest[] = "1.2.840.113549.1.9.4";
 
-// Contents of the authenticated attributes: what RFC 2315 §9.2 asks for.
+// The contents of the authenticated attributes that RFC 2315 §9.2 requires.
 Bytes Attributes(Digest digest, const Bytes& content) {
   return Concat({
       der::Sequence({der::Oid(kContentType), der::Set({der::Oid(kData)})}),

@@ -1,8 +1,8 @@
-// Building the signature block of a signed JAR: a PKCS#7 SignedData (RFC 2315 §9) without content,
+// Builds the signature block of a signed JAR: a PKCS#7 SignedData (RFC 2315 §9) without content,
 // with one signer.
 //
-// The defaults make a good block; each field changes one thing about it. Optional fields hold DER
-// that takes the place of what would be made.
+// The defaults make a good block. Each field changes one part of it. Optional fields hold DER that
+// replaces the part that would be made.
 #pragma once
 
 #include <optional>
@@ -15,16 +15,16 @@ struct SignatureBlock {
   // The signer's key, and the digest that it signs.
   std::string key = "rsa-2048";
   Digest digest = Digest::kSha256;
-  // The key that issued the signer's certificate; empty: its own.
+  // The key that issued the signer's certificate; empty: the signer's own.
   std::string issuer_key;
-  // The serial number by which the signer is known; not set: its certificate's.
+  // The serial number that names the signer; unset: its certificate's.
   std::optional<Bytes> serial;
   // The signature covers authenticated attributes, which hold the digest of the signature file.
   bool authenticated_attributes = false;
   // The signature covers other bytes than the signature file.
   bool wrong_digest = false;
 
-  // Contents of the [0] of certificates; an empty value is an empty set.
+  // The contents of the [0] of certificates; an empty value is an empty set.
   std::optional<Bytes> certificates;
   std::optional<Bytes> digest_algorithm;  // the SignerInfo's
   std::optional<Bytes> encrypted_digest;  // the whole OCTET STRING
@@ -32,7 +32,7 @@ struct SignatureBlock {
   std::optional<Bytes> content_type;      // the ContentInfo's OBJECT IDENTIFIER
   std::optional<Bytes> signed_data;       // the whole SignedData
 
-  // The signer's certificate as the block holds it, unless `certificates` is set.
+  // The signer's certificate in the block, unless `certificates` is set.
   Certificate SignerCertificate() const;
   // The signer's SignerInfo over the signature file's bytes, and the block.
   Bytes SignerInfo(const Bytes& signature_file) const;
@@ -42,7 +42,7 @@ struct SignatureBlock {
   Bytes SignedData(const Bytes& signature_file) const;
 };
 
-// The block over the signature file as somebody makes it who knows no more of the RSA test key
-// `victim` than everyone does, and writes the encoded messages themselves where signatures belong:
-// good ones, if these contents of the exponent INTEGER leave them as they are.
+// A block over the signature file that anyone can make without the private half of the RSA test key
+// `victim`. It has encoded messages in place of signatures. They count as signatures if the public
+// operation, with these contents of the exponent INTEGER, returns its argument.
 Bytes ForgedBlock(const Bytes& signature_file, const std::string& victim, const Bytes& exponent);

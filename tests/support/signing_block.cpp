@@ -21,20 +21,20 @@ Bytes Number64(uint64_t value) {
       {Number32(static_cast<uint32_t>(value)), Number32(static_cast<uint32_t>(value >> 32))});
 }
 
-// The pieces, with their length before them.
+// The pieces, after their total length.
 Bytes Prefixed(const std::vector<Bytes>& pieces) {
   const Bytes whole = Concat(pieces);
   return Concat({Number32(static_cast<uint32_t>(whole.size())), whole});
 }
 
-// An archive without a comment, taken apart.
+// The parts of an archive without a comment.
 struct ArchiveParts {
   Bytes entries, directory, end_record;
 };
 
 constexpr size_t kEndRecordSize = 22;            // of the end of the central directory
-constexpr size_t kDirectoryOffsetInRecord = 16;  // where that tells the directory's offset
-constexpr size_t kCommentInRecord = 20;          // and the length of the comment
+constexpr size_t kDirectoryOffsetInRecord = 16;  // the directory's offset, in that record
+constexpr size_t kCommentInRecord = 20;          // the length of the comment, in that record
 
 ArchiveParts TakeApart(const Bytes& archive) {
   if (archive.size() < kEndRecordSize) abort();

@@ -1,7 +1,7 @@
-// Writing the block of the schemes after JAR signing (APK Signature Scheme v2, v3, v3.1), which
-// lies between an archive's entries and its central directory, layer by layer. What lies in
-// META-INF is to it an entry like others. Numbers are little-endian; every list and element has its
-// length as 32 bits before it.
+// Writes, layer by layer, the block of the schemes after JAR signing (APK Signature Scheme v2, v3,
+// v3.1). It lies between an archive's entries and its central directory. To it, META-INF is an
+// entry like others. Numbers are little-endian. Every list and element has its length as 32 bits
+// before it.
 #pragma once
 
 #include <cstdint>
@@ -21,10 +21,10 @@ Bytes SignerBytes(const Bytes& certificate);
 Bytes Signers(const std::vector<Bytes>& signers);
 // The block of these pairs of scheme and value: size, pairs, size again, magic.
 Bytes SigningBlockBytes(const std::vector<std::pair<uint32_t, Bytes>>& pairs);
-// The archive, which has no comment, with `block` before its central directory and then `comment`
-// at its end, of at most 255 characters.
+// The archive with `block` before its central directory and `comment`, of at most 255 characters,
+// at its end. The archive must not have a comment.
 Bytes ArchiveWithBlock(const Bytes& archive, const Bytes& block, const std::string& comment = "");
 
-// The archive, which has no such block and no comment, signed with scheme v2 by the RSA test key
-// `key`: with a block that vouches for all bytes of the file but its own.
+// The archive, signed with scheme v2 by the RSA test key `key`: the block covers all bytes of the
+// file but its own. The archive must have neither a block nor a comment.
 Bytes AddSigningBlock(const Bytes& archive, const std::string& key);

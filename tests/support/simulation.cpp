@@ -9,8 +9,8 @@
 
 namespace {
 
-// The journal without the events that tell of the simulation and not of the phone, which come
-// before and after all others, and without the platform libraries' own log records.
+// The journal without the platform libraries' own log records and without the events about the
+// simulation itself, which come before and after all others.
 std::string TimelineOf(const std::string& journal) {
   std::istringstream lines(journal);
   std::string line;
@@ -37,7 +37,7 @@ Simulation Simulate(const std::string& file, const std::vector<std::string>& opt
 Simulation Simulate(const std::string& file, const std::vector<std::string>& options,
                     const Start& start) {
   std::vector<std::string> command = start.before;
-  command.insert(command.end(), {SimulatorPath(), "--json"});
+  command.insert(command.end(), {SimulatorPath(), "--installer=off", "--install=no", "--json"});
   command.insert(command.end(), options.begin(), options.end());
   command.push_back(file);
   const ProcessResult run = RunProcess(command, start.directory);
@@ -49,7 +49,8 @@ Simulation Simulate(const std::string& file, const std::vector<std::string>& opt
 std::vector<std::string> FirstLines(size_t count, const std::vector<std::string>& words,
                                     const Start& start) {
   std::vector<std::string> command = start.before;
-  command.insert(command.end(), {"env", "LC_ALL=C.UTF-8", SimulatorPath()});
+  command.insert(command.end(),
+                 {"env", "LC_ALL=C.UTF-8", SimulatorPath(), "--installer=off", "--install=no"});
   command.insert(command.end(), words.begin(), words.end());
   const ProcessResult run = RunProcess(command, start.directory);
   std::vector<std::string> lines;

@@ -1,4 +1,4 @@
-// Running the built programs as processes.
+// Runs the built programs as processes.
 #pragma once
 
 #include <string>
@@ -9,11 +9,13 @@ struct Simulation {
   std::string timeline;  // see expected_timeline.h
 };
 
-// Runs the tool on `file` in the simulated phone that `options` describe. A simulation that itself
-// fails, or that writes anything on standard error, is a test failure.
+// Runs the tool on `file` in the simulated phone that `options` describe. Here and below no phone's
+// installer is asked and no library is laid out, unless an option says so: most tests are for the
+// tool's own answers about the files as they lie there. The test fails if the simulation itself
+// fails or writes anything to standard error.
 Simulation Simulate(const std::string& file, const std::vector<std::string>& options = {});
 
-// The same with more control: the whole command up to the simulator's options, and the folder.
+// The same with more control: the whole command before the simulator's options, and the directory.
 struct Start {
   std::vector<std::string> before;  // such as {"unshare", "-m"}
   std::string directory;
@@ -21,16 +23,16 @@ struct Start {
 Simulation Simulate(const std::string& file, const std::vector<std::string>& options,
                     const Start& start);
 
-// The first lines that a person sees who reads UTF-8 and runs the simulator with these words in the
-// folder `directory`; and its exit status, as a last line "-> STATUS".
+// Runs the simulator with these words in the directory of `start`, in a locale of UTF-8. Returns
+// the first `count` lines of its output, and its exit status as a last line "-> STATUS".
 std::vector<std::string> FirstLines(size_t count, const std::vector<std::string>& words,
                                     const Start& start);
 
-// Whether the built programs are for another processor and run under an emulator, which answers
-// some questions in the kernel's place.
+// True if the built programs are for another processor and run under an emulator, which answers
+// some questions in place of the kernel.
 bool AreProgramsEmulated();
 
-// The built programs.
+// The paths of the built programs.
 std::string ToolPath();
 std::string SimulatorPath();
 std::string VerifyPath();

@@ -12,7 +12,7 @@ constexpr uint16_t kVersion = 20;
 constexpr uint16_t kDescriptorFlag = 1 << 3;
 constexpr uint16_t kStored = 0, kDeflated = 8;
 
-// What is true of an item's data.
+// The true facts of an item's data.
 struct Facts {
   Bytes contents;
   uint32_t crc;
@@ -30,7 +30,7 @@ Facts FactsOf(const ZipItem& item) {
   return facts;
 }
 
-// The part that the local and the central header share.
+// The part that the local and the central header have in common.
 void PutCommon(Bytes& out, const ZipItem& item) {
   Put16(out, kVersion);
   Put16(out, item.data_descriptor ? kDescriptorFlag : uint16_t{0});

@@ -1,5 +1,5 @@
 // The two refusals that no signing tool's package ever meets: an exponent of 1, and a library that
-// is no longer the file that was read. On packages that aapt and apksigner made.
+// has changed since it was read. The packages are made by aapt and apksigner.
 #include <sys/stat.h>
 
 #include <algorithm>
@@ -13,22 +13,22 @@ namespace {
 
 // ---- An exponent of 1: anyone can write down signatures for any key.
 
-// The made package of the victim, its signature block exchanged for a forged one.
+// The victim's package with a forged signature block.
 Bytes WithForgedBlock(const Bytes& exponent) {
-  const TempDir folder;
-  const std::string apk = folder.Write("base.apk", Made("victim"));
+  const TempDir directory;
+  const std::string apk = directory.Write("base.apk", Made("victim"));
   const std::string entry = "META-INF/CERT.SF";
-  EXPECT_EQ(RunProcess({"unzip", "-q", apk, entry, "-d", folder.path()}).status, 0);
-  const Bytes signature_file = ToBytes(ContentOf(folder / entry));
-  folder.Write("META-INF/CERT.RSA", ForgedBlock(signature_file, "rsa-2048", exponent));
+  EXPECT_EQ(RunProcess({"unzip", "-q", apk, entry, "-d", directory.path()}).status, 0);
+  const Bytes signature_file = ToBytes(ContentOf(directory / entry));
+  directory.Write("META-INF/CERT.RSA", ForgedBlock(signature_file, "rsa-2048", exponent));
   EXPECT_EQ(RunProcess({"aapt", "remove", apk, "META-INF/CERT.RSA"}).status, 0);
-  EXPECT_EQ(RunProcess({"aapt", "add", apk, "META-INF/CERT.RSA"}, folder.path()).status, 0);
+  EXPECT_EQ(RunProcess({"aapt", "add", apk, "META-INF/CERT.RSA"}, directory.path()).status, 0);
   return ToBytes(ContentOf(apk));
 }
 
-// However 1 and -1 are written so that the record reads them: with any tail that leaves the length
-// of the modulus as it is, which is 256, 00 01 00 00 in the order of the host.
-TEST(Threat, AnExponentOfOneIsRefusedHoweverItIsWritten) {
+// All ways to write 1 and -1 so that the record reads them, with any tail that keeps the length of
+// the modulus at 256: 00 01 00 00 in host byte order.
+TEST(Threat, AnExponentOfOneIsRefusedInEveryForm) {
   for (const char* exponent :
        {"01", "01 00", "01 00 00", "01 00 00 00", "FF FF FF FF", "01 00 00 00 00 01",
         "01 00 00 00 00 01 00", "01 00 00 00 00 01 00 00", "01 00 00 00 00 01 00 00 AA BB",
@@ -40,7 +40,7 @@ TEST(Threat, AnExponentOfOneIsRefusedHoweverItIsWritten) {
   }
 }
 
-// They reach the signature's check, and fail there.
+// These exponents reach the check of the signature, and fail there.
 TEST(Threat, AnyOtherExponentAsksForThePrivateKey) {
   for (const char* exponent : {"00", "02", "03", "11", "7F", "01 00 01", "01 01", "00 01", "02 00",
                                "FE FF FF FF", "FF FF FF 7F", "FF FF FF", "FF", "00 00 00 01"}) {
@@ -60,8 +60,8 @@ class ExchangedLibrary : public testing::Test {
     device_.Install("../system/program", ToBytes("\177ELF system"));
   }
 
-  // What is signed when `exchange` is made between the check and the signing: the package, and the
-  // library or not.
+  // The files that are signed if `exchange` happens between the check and the signing: the package,
+  // and perhaps the library.
   Strings FilesSigned(const std::function<void()>& exchange) {
     device_.phone.before_open = [=](const char* path, int) {
       seen_ += std::string(path).find("/mine/libx.so") != std::string::npos;
@@ -74,7 +74,7 @@ class ExchangedLibrary : public testing::Test {
     return files;
   }
   void ExpectRefused(const std::function<void()>& exchange) {
-    alarm(60);  // whoever waits for a FIFO is ended
+    alarm(60);  // ends a test that waits for a FIFO
     EXPECT_EQ(FilesSigned(exchange), Strings({"app/base.apk"}));
     alarm(0);
     const std::string path = device_.Path("lib/arm64/../../../mine/libx.so");
@@ -92,7 +92,7 @@ class ExchangedLibrary : public testing::Test {
   int seen_ = 0;
 };
 
-TEST_F(ExchangedLibrary, ThatStaysAsItWasIsSigned) {
+TEST_F(ExchangedLibrary, ThatStaysUnchangedIsSigned) {
   EXPECT_EQ(FilesSigned([] {}), Strings({"mine/libx.so", "app/base.apk"}));
 }
 
@@ -110,7 +110,7 @@ TEST_F(ExchangedLibrary, ForAFifoIsRefusedWithoutWaiting) {
   });
 }
 
-TEST_F(ExchangedLibrary, ForAFolderIsRefused) {
+TEST_F(ExchangedLibrary, ForADirectoryIsRefused) {
   ExpectRefused([this] {
     Remove();
     EXPECT_EQ(mkdir(target_.c_str(), 0700), 0);
@@ -132,7 +132,7 @@ TEST_F(ExchangedLibrary, WrittenToIsRefused) {
   });
 }
 
-// Times can be set, but not the one of the last change of state.
+// A program can set the times of a file, but not its ctime.
 TEST_F(ExchangedLibrary, WrittenToWithItsTimeSetBackIsRefused) {
   ExpectRefused([this] {
     struct stat before;

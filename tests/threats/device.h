@@ -1,4 +1,4 @@
-// The whole tool over a file on disk, on a healthy phone inside the test program.
+// Runs the whole tool on a file on disk, on a healthy phone inside the test program.
 #pragma once
 
 #include <fcntl.h>
@@ -21,7 +21,7 @@ using Strings = std::vector<std::string>;
 
 inline const Bytes kLibrary = ToBytes("\177ELF foo");
 
-// What aapt and apksigner made.
+// A package that aapt and apksigner made.
 inline Bytes Made(const std::string& name) {
   return ToBytes(ContentOf(THREAT_PACKAGES "/" + name + "/base.apk"));
 }
@@ -31,22 +31,22 @@ class Device {
   explicit Device(const Bytes& archive) : path_(temp_.Write("app/base.apk", archive)) {}
   explicit Device(const Package& package) : Device(package.Build()) {}
 
-  // Puts the bytes on disk, at a path from the package's folder on.
+  // Writes the bytes to disk, at a path relative to the package's directory.
   Device& Install(const std::string& path, const Bytes& content) {
     temp_.Write("app/" + path, content);
     return *this;
   }
-  // The same path, of the file system.
+  // The absolute path.
   std::string Path(const std::string& path) const { return temp_ / ("app/" + path); }
 
-  // The names, from the folder above the package's on, of the files that were signed with the key
-  // of `signer`, in their order.
+  // The names of the files that were signed with the key of `signer`, in order, relative to the
+  // directory above the package's.
   Strings FilesSignedFor(const std::string& signer) {
     const std::string payload = "2000" + Hex(DigestOf(Digest::kSha256, ModulusOf(signer)));
     return FilesSignedWith(payload);
   }
 
-  // Of all that begin so, in hexadecimal digits.
+  // The same for payloads that begin with these hexadecimal digits.
   Strings FilesSignedWith(const std::string& payload) {
     Strings files;
     phone.witness = [&](int fd, const std::string& event) {
@@ -61,7 +61,7 @@ class Device {
     return files;
   }
 
-  // What libzu was asked to register: name and data.
+  // The registrations with libzu: name and data.
   Strings Registered() {
     RunSteps();
     Strings registered;

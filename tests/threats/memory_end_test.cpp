@@ -1,5 +1,5 @@
-// Documents and manifests at the very end of memory: what the platform's parser, or the tool's own,
-// reads beyond them ends the test.
+// Documents and manifests at the very end of memory. If the platform's parser, or the tool's own,
+// reads beyond them, the test crashes.
 #include <gtest/gtest.h>
 
 #include "apk/apk.h"
@@ -11,8 +11,8 @@
 
 namespace {
 
-// Parses the document in the block that the tool makes for it, at the end of memory: the document,
-// and room for an attribute (20 bytes), or for the header of a chunk (8 bytes), that is not there.
+// Parses the document in the block that the tool makes for it, at the end of memory. The block also
+// has room for a missing attribute (20 bytes), or for the missing header of a chunk (8 bytes).
 bool ParseAtMemoryEnd(ApkTools::Apk* apk, const Bytes& document) {
   PutNextBlockAtMemoryEnd(document.size() + 20);
   const bool parsed = apk->ParseAndroidManifest(document);
@@ -20,7 +20,7 @@ bool ParseAtMemoryEnd(ApkTools::Apk* apk, const Bytes& document) {
   return parsed;
 }
 
-TEST(CompiledManifestAtMemoryEnd, IsNotReadBeyondHoweverShortItIs) {
+TEST(CompiledManifestAtMemoryEnd, IsNotReadBeyondAtAnyLength) {
   const Bytes whole = CompiledManifest("com.example.app", true);
   for (size_t size = 0; size <= whole.size(); ++size) {
     LogCapture log;
@@ -31,13 +31,13 @@ TEST(CompiledManifestAtMemoryEnd, IsNotReadBeyondHoweverShortItIs) {
   }
 }
 
-// Writes the size of the chunk that starts at `chunk`.
+// Sets the size of the chunk that starts at `chunk`.
 void SetSize(Bytes* document, size_t chunk, size_t size) {
   for (size_t i = 0; i < 4; ++i) (*document)[chunk + 4 + i] = static_cast<uint8_t>(size >> (8 * i));
 }
 
-// The last node ends so many bytes before the document does, and the header of another is looked
-// for there.
+// The last node ends this many bytes before the document. The parser looks there for another
+// header.
 TEST(CompiledManifestAtMemoryEnd, IsNotReadBeyondForANodeThatIsNotThere) {
   for (uint8_t rest = 1; rest <= 8; ++rest) {
     Bytes document = CompiledManifest("com.example.app", true);
@@ -51,7 +51,7 @@ TEST(CompiledManifestAtMemoryEnd, IsNotReadBeyondForANodeThatIsNotThere) {
   }
 }
 
-// An attribute of size 0 may lie where its element ends: all of it lies behind that.
+// An attribute of size 0 may lie at the end of its element. All of its fields lie beyond that.
 TEST(CompiledManifestAtMemoryEnd, IsNotReadBeyondForAnAttributeThatIsNotThere) {
   constexpr size_t kNode = 36, kAttribute = 20;
   Bytes document =
@@ -68,20 +68,20 @@ TEST(CompiledManifestAtMemoryEnd, IsNotReadBeyondForAnAttributeThatIsNotThere) {
   EXPECT_EQ(apk.GetPackageName(), "p");
 }
 
-TEST(CompiledManifestAtMemoryEnd, WithoutRoomForAHeaderIsNone) {
+TEST(CompiledManifestAtMemoryEnd, WithoutRoomForAHeaderIsRefused) {
   const Bytes whole = CompiledManifest("com.example.app");
   for (int size = 0; size < 8; ++size) {
     ApkTools::Apk apk(-1);
     LogCapture log;
     EXPECT_FALSE(ParseAtMemoryEnd(&apk, Bytes(whole.begin(), whole.begin() + size)));
-    // The parser's code for a type that it does not take.
+    // The parser's code for a type that it does not accept.
     EXPECT_EQ(log.records(), Records({Error("ParseAndroidManifest failed to init xml parser, "
                                             "error=0x80000001\n")}))
         << size;
   }
 }
 
-// The table that the sections are sorted in has a hash and a number for each.
+// The table for sorting has a hash and a number for each section.
 TEST(EntryDigestsAtMemoryEnd, AreSortedWithoutOneMore) {
   constexpr size_t kSections = 33;
   std::string text;
@@ -101,8 +101,8 @@ TEST(EntryDigestsAtMemoryEnd, AreSortedWithoutOneMore) {
   EXPECT_EQ(digest, "1");
 }
 
-// A table that is full when it is put in order, at the 33rd attribute, whose name is the first to
-// begin 1024 bytes into the text.
+// The table is full when it is sorted, at the 33rd attribute. The name of that attribute is the
+// first to begin 1024 bytes or more into the text.
 TEST(ManifestSectionsAtMemoryEnd, AreNotReadBeyondTheLastAttribute) {
   constexpr uint32_t kAttributes = 33;
   std::string text;
@@ -119,9 +119,9 @@ TEST(ManifestSectionsAtMemoryEnd, AreNotReadBeyondTheLastAttribute) {
   EXPECT_EQ(sections[0].find("83"), std::string(30, 'v'));
 }
 
-// Names and values of all lengths below that of the eight bytes which are read at once, whole or
-// cut anywhere. A block ends where memory does if its size is a multiple of 4.
-TEST(JarManifestAtMemoryEnd, IsNotReadBeyondWhereverItEnds) {
+// Names and values of all lengths below eight bytes, which are read at once; the text is whole, or
+// cut anywhere. A block ends where memory ends if its size is a multiple of 4.
+TEST(JarManifestAtMemoryEnd, IsNotReadBeyondAtAnyLength) {
   for (size_t length = 1; length < 20; ++length) {
     const std::string run(length, 'v');
     const std::string whole = run + ": " + run + "\r\n " + run + "\r\nKey:\r\n " + run + "\r\n\r\n";

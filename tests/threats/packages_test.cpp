@@ -1,5 +1,5 @@
-// What can be done with packages that aapt and apksigner made, against an install path that leaves
-// the JAR signature to this tool (docs/threat-model.md).
+// Attacks with packages that aapt and apksigner made, on an install path that leaves the JAR
+// signature to this tool (docs/threat-model.md).
 #include <gtest/gtest.h>
 
 #include <filesystem>
@@ -18,18 +18,18 @@ std::string Made(const std::string& name) {
   return std::filesystem::canonical(THREAT_PACKAGES).string() + "/" + name + "/base.apk";
 }
 
-// Both libraries of the package and the package itself signed for the key, then the key registered.
+// The events if both libraries and the package are signed for the key, and the key is registered.
 std::string AllSignedAndRegistered(const std::string& apk, const std::string& key,
                                    const std::string& name) {
-  const std::string folder = std::filesystem::path(apk).parent_path();
+  const std::string directory = std::filesystem::path(apk).parent_path();
   const Bytes payload = PackagePayload(key);
-  return Timeline({LibraryStep({SignedLibrary(folder + "/lib/arm64/libvault.so", payload),
-                                SignedLibrary(folder + "/lib/arm/libvault.so", payload)}),
+  return Timeline({LibraryStep({SignedLibrary(directory + "/lib/arm64/libvault.so", payload),
+                                SignedLibrary(directory + "/lib/arm/libvault.so", payload)}),
                    PackageStep(apk, payload), Register(3, apk, name, ModulusOf(key)),
                    Log(4, "ZuAddCertificate: ZuNewCertificate return 0.\n"), Exit(0)});
 }
 
-// ---- Whom apksigner signs for, whatever the key.
+// ---- Packages signed by apksigner with each kind of RSA key.
 
 class KeyOfApksigner : public testing::TestWithParam<const char*> {};
 
@@ -49,18 +49,18 @@ INSTANTIATE_TEST_SUITE_P(Rsa, KeyOfApksigner,
                                          "rsa-2048-e17", "rsa-2048-other", "rsa-3072", "rsa-4096"),
                          NameOf);
 
-// ---- The newer signing block is the installer's; META-INF is nobody's but this tool's then.
+// ---- The installer checks the newer signing block. Then only this tool checks META-INF.
 
 class ForeignMetaInf : public testing::TestWithParam<const char*> {
  protected:
-  // The made package below the attacker's own signing block, its libraries beside it.
-  ForeignMetaInf() : apk_(folder_ / "base.apk") {
+  // The package below the attacker's own signing block, with its libraries beside it.
+  ForeignMetaInf() : apk_(directory_ / "base.apk") {
     std::filesystem::copy(std::filesystem::path(Made(GetParam())).parent_path() / "lib",
-                          folder_ / "lib", std::filesystem::copy_options::recursive);
+                          directory_ / "lib", std::filesystem::copy_options::recursive);
     WriteFile(apk_, AddSigningBlock(ToBytes(ContentOf(Made(GetParam()))), "rsa-2048-other"));
   }
 
-  TempDir folder_;
+  TempDir directory_;
   const std::string apk_;
 };
 
@@ -83,21 +83,22 @@ TEST_P(ForeignMetaInf, GetsTheVictimsPayloadAndTheVictimsKeyUnderTheAttackersNam
 
 INSTANTIATE_TEST_SUITE_P(Around, ForeignMetaInf, testing::Values("foreign", "no-dex"), NameOf);
 
-// The twin: around one's own META-INF nothing of the victim's is to be had.
+// The twin: with one's own META-INF, an attacker gets nothing of the victim's.
 TEST(OwnMetaInf, GetsItsOwnPayload) {
   const std::string apk = Made("keys/rsa-2048-other");
-  TempDir folder;
-  const std::string signed_again = folder / "base.apk";
-  std::filesystem::copy(std::filesystem::path(apk).parent_path() / "lib", folder / "lib",
+  TempDir directory;
+  const std::string signed_again = directory / "base.apk";
+  std::filesystem::copy(std::filesystem::path(apk).parent_path() / "lib", directory / "lib",
                         std::filesystem::copy_options::recursive);
   WriteFile(signed_again, AddSigningBlock(ToBytes(ContentOf(apk)), "rsa-2048-other"));
   EXPECT_EQ(Simulate(signed_again).timeline,
             AllSignedAndRegistered(signed_again, "rsa-2048-other", "com.example.vault"));
 }
 
-// ---- Attributes are known by their local names.
+// ---- Only the local names of attributes are compared.
 
-// The installer's name for it is com.evil.reader, and it requests no permission: it declares one.
+// The installer reads the name com.evil.reader. The package requests no permission: it declares
+// one.
 TEST(AttributeInAnotherNamespace, NamesAnotherPackageThanTheInstallerReads) {
   const std::string apk = Made("attribute");
   const ProcessResult installer = RunProcess({"aapt", "dump", "permissions", apk});

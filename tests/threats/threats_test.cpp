@@ -1,5 +1,5 @@
-// What a hostile file can reach by rules that are lenient or trusting on purpose, and where that
-// ends. docs/threat-model.md says why each is as it is.
+// The reach of hostile files through rules that are lenient or trusting on purpose, and its limits.
+// docs/threat-model.md gives the reasons.
 #include <sys/mman.h>
 #include <sys/wait.h>
 
@@ -16,9 +16,9 @@
 
 namespace {
 
-// ---- Whose package it is.
+// ---- The owner of a package.
 
-// The certificate of the key; they are told apart by their serial numbers.
+// The certificate of the key. Serial numbers tell the certificates apart.
 Certificate CertificateOf(const std::string& key, uint64_t serial) {
   Certificate certificate;
   certificate.key = key;
@@ -26,8 +26,7 @@ Certificate CertificateOf(const std::string& key, uint64_t serial) {
   return certificate;
 }
 
-// A package whose block has the certificates of two keys, and the SignerInfos of two, each in this
-// order.
+// A package whose block has the certificates and the SignerInfos of two keys, each in this order.
 Package WithTwoSigners(const Strings& certificates, const Strings& signers) {
   Package package = MakePackage();
   const Bytes signature_file = package.Item("META-INF/CERT.SF").data;
@@ -51,11 +50,11 @@ Package WithTwoSigners(const Strings& certificates, const Strings& signers) {
 }
 
 bool IsVerifiedByOpenssl(Package package) {
-  const TempDir folder;
-  folder.Write("block", package.Item("META-INF/CERT.RSA").data);
-  folder.Write("file", package.Item("META-INF/CERT.SF").data);
+  const TempDir directory;
+  directory.Write("block", package.Item("META-INF/CERT.RSA").data);
+  directory.Write("file", package.Item("META-INF/CERT.SF").data);
   return RunProcess({"openssl", "cms", "-verify", "-noverify", "-binary", "-inform", "DER", "-in",
-                     folder / "block", "-content", folder / "file", "-out", "/dev/null"})
+                     directory / "block", "-content", directory / "file", "-out", "/dev/null"})
              .status == 0;
 }
 
@@ -64,7 +63,7 @@ TEST(Threat, OfTwoSignersTheFirstCertificateAndTheFirstSignatureCount) {
   for (const Strings& certificates : {one, other}) {
     for (const Strings& signers : {one, other}) {
       const Package package = WithTwoSigners(certificates, signers);
-      // Another reader looks for the certificate that goes with each signature.
+      // Other readers look for the certificate that belongs to each signature.
       EXPECT_TRUE(IsVerifiedByOpenssl(package));
       const bool is_pair = certificates[0] == signers[0];
       EXPECT_EQ(Device(package).FilesSignedFor(certificates[0]),
@@ -74,8 +73,8 @@ TEST(Threat, OfTwoSignersTheFirstCertificateAndTheFirstSignatureCount) {
   }
 }
 
-// The modulus has four bytes behind it, and the exponent's fifth to eighth byte make its length
-// what it was: 256, 00 01 00 00 in the order of the host. Another reader sees a key of 2080 bits.
+// Four bytes follow the modulus. The exponent's fifth to eighth bytes set its length to the old
+// value: 256, 00 01 00 00 in host byte order. Other readers see a key of 2080 bits.
 TEST(Threat, AModulusWithJunkBehindItIsTheKeyThatItStartsWith) {
   Package package = MakePackage();
   Certificate certificate;
@@ -88,7 +87,7 @@ TEST(Threat, AModulusWithJunkBehindItIsTheKeyThatItStartsWith) {
   EXPECT_EQ(Device(package).FilesSignedFor("rsa-2048"), Strings({"app/base.apk"}));
 }
 
-// Nothing in what is verified says that there is a newer one.
+// Nothing that is verified tells of a newer package.
 TEST(Threat, AnOlderPackageOfASignerKeepsItsPayload) {
   const Package older = MakePackage();
   PackageOptions options;
@@ -118,8 +117,7 @@ TEST(Threat, DotsInAnEntryNameSignNoFileOutsideWithOtherBytes) {
   EXPECT_EQ(device.FilesSignedFor("rsa-2048"), Strings({"app/base.apk"}));
 }
 
-// The program's name ends in nothing that a library's does. What its bytes are is known, and
-// listed.
+// The program's name does not end like a library's. The manifest lists its bytes, which are known.
 void ExpectProgramSigned(const std::function<int(const char* program, const char* name)>& lead) {
   Device device(MakePackage(WithLibrariesNamed({"lib/arm64-v8a/../../../mine/libx.so"})));
   device.Install("lib/arm64/x", {}).Install("../mine/x", {}).Install("../system/program", kLibrary);
@@ -145,7 +143,7 @@ TEST(Threat, FileIsReadAndSignedForEachEntryThatNamesIt) {
             Strings({"app/lib/arm64/a.so", "app/lib/arm64/a.so", "app/base.apk"}));
 }
 
-TEST(Threat, ReplacedAndroidManifestNamesWhatTheSignersKeyIsRegisteredFor) {
+TEST(Threat, ReplacedAndroidManifestNamesThePackageOfTheSignersKey) {
   Package package = MakePackage();
   package.Item(kAndroidManifestName).data = CompiledManifest("com.example.other", true);
   EXPECT_EQ(Device(package).Registered(),
@@ -170,9 +168,9 @@ TEST(Threat, PackageWhoseAndroidManifestCannotBeExtractedIsAJarThatTheKernelMust
   EXPECT_EQ(other.FilesSignedWith("0000"), Strings());
 }
 
-// ---- What a refused library, a damaged one, or one that stays in the package does not stop.
+// ---- Refused, damaged and unextracted libraries, and the steps that they do not stop.
 
-TEST(Threat, PackageAndKeyAreTakenThoughEveryLibraryIsRefused) {
+TEST(Threat, PackageAndKeyAreAcceptedEvenIfEveryLibraryIsRefused) {
   PackageOptions options;
   options.secure_storage = true;
   Device device(MakePackage(options));
@@ -182,7 +180,7 @@ TEST(Threat, PackageAndKeyAreTakenThoughEveryLibraryIsRefused) {
             Strings({"com.example.app " + Hex(ModulusOf("rsa-2048"))}));
 }
 
-// Nothing was extracted, and the bytes in the package are not looked at.
+// Nothing was extracted, and the bytes in the package are not read.
 TEST(Threat, LibrariesThatStayInThePackageAreNotCompared) {
   Package package = MakePackage();
   package.Item("lib/arm64-v8a/libfoo.so").data = ToBytes("another's");
@@ -202,7 +200,7 @@ Strings LibrariesWalked(const Package& package) {
   return names;
 }
 
-// The library compares the entry's two headers when it comes to it, and ends the walk there.
+// The library compares the entry's two headers when it reaches the entry, and ends the walk there.
 TEST(Threat, ADamagedLibraryEndsTheWalkAndIntactOnesBehindItStayUnsigned) {
   const Strings names = {"lib/arm64-v8a/liba.so", "lib/arm64-v8a/libb.so", "lib/arm64-v8a/libc.so"};
   const Package intact = MakePackage(WithLibrariesNamed(names));
@@ -228,9 +226,9 @@ TEST(Threat, ADamagedLibraryEndsTheWalkAndIntactOnesBehindItStayUnsigned) {
   }
 }
 
-// ---- What is written to while it is worked on.
+// ---- Files that are written to during the run.
 
-// The files that are signed, and the bytes that they have then.
+// The files that are signed, and their bytes at that moment.
 std::map<std::string, std::string> BytesSigned(Device& device) {
   std::map<std::string, std::string> signed_bytes;
   device.phone.witness = [&](int fd, const std::string& event) {
@@ -259,7 +257,7 @@ TEST(Threat, ALibraryThatIsWrittenToInPlaceAfterItsChecksIsSigned) {
   EXPECT_EQ(BytesSigned(device)[library], "\177ELF Foo");
 }
 
-// A page that is to be written back already takes more writes without a sign of them in the times.
+// A dirty page takes more writes without a change of the times.
 TEST(Threat, ALibraryThatIsWrittenToThroughAMappingAfterItWasReadIsSigned) {
   Device device(MakePackage());
   device.Install("lib/arm64/libfoo.so", kLibrary);
@@ -295,7 +293,7 @@ TEST(Threat, APackageThatIsWrittenToInPlaceAfterItsChecksIsSigned) {
   EXPECT_EQ(BytesSigned(device)[package], expected);
 }
 
-// Between the kernel's word that it trusts the file and its being signed.
+// The write comes after the kernel answers that it trusts the file, and before it signs the file.
 TEST(Threat, AJarThatIsWrittenToInPlaceAfterItWasTrustedIsSigned) {
   const Bytes archive = MakePackage(PlainJar()).Build();
   Device device(archive);
@@ -304,7 +302,7 @@ TEST(Threat, AJarThatIsWrittenToInPlaceAfterItWasTrustedIsSigned) {
   EXPECT_EQ(BytesSigned(device)[jar][0], 'p');
 }
 
-// The zip library has the directory of the archive mapped. What had been signed before stays so.
+// The zip library maps the archive's directory. Earlier signatures stay.
 TEST(Threat, AFileThatShrinksMeanwhileEndsTheProcess) {
   PackageOptions options = WithLibrariesNamed({"lib/arm64-v8a/libfoo.so"});
   for (int i = 0; i < 1000; ++i) options.entries.push_back({"assets/" + std::to_string(i), {}});

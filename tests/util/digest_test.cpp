@@ -1,4 +1,4 @@
-// The digests against the vectors of their standards, and against the openssl command line.
+// The digests, compared with the vectors of their standards and with the openssl command.
 #include "util/digest.h"
 
 #include <gtest/gtest.h>
@@ -19,7 +19,7 @@ std::string HexDigest(Digest digest, const std::string& text) {
   return Hex(out);
 }
 
-// What `openssl dgst -NAME` says of `bytes`.
+// The output of `openssl dgst -NAME` for `bytes`.
 std::string OpensslDigest(const std::string& name, const Bytes& bytes) {
   const DiskFile file(bytes);
   const std::string command = "openssl dgst -r -" + name + " " + file.path();
@@ -37,7 +37,7 @@ TEST(Digest, Md5OfThePublishedVectors) {
   EXPECT_EQ("f96b697d7cb7938d525a2f31aaf161d0", HexDigest(ComputeMD5Digest, "message digest"));
 }
 
-// FIPS 180-2, appendix A, and the digest of nothing as NIST lists it.
+// FIPS 180-2, appendix A, and NIST's digest of an empty message.
 TEST(Digest, Sha1OfThePublishedVectors) {
   EXPECT_EQ("da39a3ee5e6b4b0d3255bfef95601890afd80709", HexDigest(ComputeSHA1Digest, ""));
   EXPECT_EQ("a9993e364706816aba3e25717850c26c9cd0d89d", HexDigest(ComputeSHA1Digest, "abc"));
@@ -46,7 +46,7 @@ TEST(Digest, Sha1OfThePublishedVectors) {
       HexDigest(ComputeSHA1Digest, "abcdbcdecdefdefgefghfghighijhijkijkljklmklmnlmnomnopnopq"));
 }
 
-// FIPS 180-2, appendix B, and the digest of nothing as NIST lists it.
+// FIPS 180-2, appendix B, and NIST's digest of an empty message.
 TEST(Digest, Sha256OfThePublishedVectors) {
   EXPECT_EQ("e3b0c44298fc1c149afbf4c8996fb92427ae41e4649b934ca495991b7852b855",
             HexDigest(ComputeSHA256Digest, ""));

@@ -1,5 +1,5 @@
-// ReadFile and GetFilenameByFd against real files, and against a kernel that answers as a real file
-// would only by chance.
+// ReadFile and GetFilenameByFd with real files, and with kernel answers that real files give only
+// by chance.
 #include "util/file.h"
 
 #include <fcntl.h>
@@ -24,7 +24,7 @@
 #include "support/lease.h"
 #include "support/log_capture.h"
 
-// What a test has the kernel answer; where nothing is set, the kernel answers itself.
+// The answers that a test sets. The kernel itself answers if a test sets none.
 namespace {
 
 struct Kernel {
@@ -62,7 +62,7 @@ ssize_t __wrap_readlink(const char* path, char* buffer, size_t size) {
   return kernel.readlink ? kernel.readlink(buffer, size) : __real_readlink(path, buffer, size);
 }
 
-// What read and readlink are called in a build with _FORTIFY_SOURCE, as every platform tree has.
+// The names of read and readlink in a build with _FORTIFY_SOURCE, as in every platform tree.
 ssize_t __wrap___read_chk(int fd, void* buffer, size_t size, size_t /*room*/) {
   return __wrap_read(fd, buffer, size);
 }
@@ -75,19 +75,19 @@ namespace {
 
 class FileTest : public testing::Test {
  protected:
-  void SetUp() override { alarm(60); }  // whoever waits for a FIFO is ended
+  void SetUp() override { alarm(60); }  // ends a test that waits for a FIFO
   void TearDown() override {
     kernel = Kernel();
     alarm(0);
   }
 
-  std::string Path(const std::string& name) const { return folder_ / name; }
+  std::string Path(const std::string& name) const { return directory_ / name; }
 
   std::string MakeFile(const std::string& content) const {
-    return folder_.Write("file", ToBytes(content));
+    return directory_.Write("file", ToBytes(content));
   }
 
-  // `path` cannot be read, which is told by `message` alone, and `out` stays as it is.
+  // `path` cannot be read; only `message` is logged, and `out` is unchanged.
   static void ExpectRefused(const std::string& path, const std::string& message) {
     LogCapture log;
     Bytes out = {1, 2, 3};
@@ -99,7 +99,7 @@ class FileTest : public testing::Test {
     ExpectRefused(path, "Can't read file: " + path + " (streamoff=-1)\n");
   }
 
-  TempDir folder_;
+  TempDir directory_;
 };
 using ReadFileTest = FileTest;
 using OpenForReadingTest = FileTest;
@@ -163,7 +163,7 @@ TEST_F(ReadFileTest, SocketCannotBeOpened) {
   close(fd);
 }
 
-TEST_F(ReadFileTest, DirectoryHasNoSize) { ExpectNoSize(folder_.path()); }
+TEST_F(ReadFileTest, DirectoryHasNoSize) { ExpectNoSize(directory_.path()); }
 
 TEST_F(ReadFileTest, DeviceHasNoSize) { ExpectNoSize("/dev/zero"); }
 
@@ -206,7 +206,7 @@ TEST_F(ReadFileTest, FileThatTheAddressSpaceHasNoRoomForHasNoSize) {
   EXPECT_EQ(3U, tried);
 }
 
-TEST_F(ReadFileTest, FileWhoseKindIsNotToldHasNoSize) {
+TEST_F(ReadFileTest, FileOfUnknownKindHasNoSize) {
   kernel.fstat = [](struct stat*) { return -1; };
   ExpectNoSize(MakeFile("abc"));
 }
@@ -221,8 +221,8 @@ TEST_F(ReadFileTest, FileThatCannotBeRewoundHasNoSize) {
   ExpectNoSize(MakeFile("abc"));
 }
 
-// As of a file that grows or shrinks between the two questions.
-TEST_F(ReadFileTest, SizeIsWhereTheFileEndsAndNotWhatItsStateSays) {
+// Like a file that grows or shrinks between the two calls.
+TEST_F(ReadFileTest, SizeIsTheFilesEndAndNotTheStatesSize) {
   for (const off_t end : {off_t{2}, off_t{5}}) {
     kernel.lseek = [end](int whence) { return whence == SEEK_END ? end : off_t{0}; };
     Bytes out;
@@ -244,7 +244,7 @@ TEST_F(ReadFileTest, FileThatShrinksMeanwhileIsTrueAndEndsInZeros) {
   EXPECT_EQ(Records(), log.records());
 }
 
-TEST_F(ReadFileTest, FileThatShrinksMeanwhileLeavesWhatTheVectorHeld) {
+TEST_F(ReadFileTest, FileThatShrinksMeanwhileLeavesTheVectorsOldBytes) {
   const std::string path = MakeFile("abcdef");
   kernel.read = [&](int fd, void* buffer, size_t size) {
     EXPECT_EQ(0, truncate(path.c_str(), 2));
@@ -290,7 +290,7 @@ TEST_F(ReadFileTest, PiecewiseAndInterruptedReadsAreJoined) {
   Bytes out;
   EXPECT_TRUE(ReadFile(MakeFile("abcdefg"), out));
   EXPECT_EQ(ToBytes("abcdefg"), out);
-  // Never for more than there is room for.
+  // No read asks for more bytes than there is room for.
   EXPECT_EQ(std::vector<size_t>({7, 7, 5, 5, 3, 3, 1, 1}), asked);
 }
 
@@ -298,7 +298,7 @@ TEST_F(ReadFileTest, NoDescriptorStaysOpen) {
   const int before = NextDescriptor();
   Bytes out;
   EXPECT_TRUE(ReadFile(MakeFile("abc"), out));
-  ExpectNoSize(folder_.path());
+  ExpectNoSize(directory_.path());
   EXPECT_EQ(before, NextDescriptor());
 }
 
@@ -315,7 +315,7 @@ TEST_F(GetFilenameByFdTest, RemovedFileIsMarkedAsTheKernelMarksIt) {
   close(fd);
 }
 
-TEST_F(GetFilenameByFdTest, ClosedDescriptorHasNone) {
+TEST_F(GetFilenameByFdTest, ClosedDescriptorHasNoPath) {
   LogCapture log;
   const int fd = open("/dev/null", O_RDONLY | O_CLOEXEC);
   close(fd);
@@ -324,14 +324,14 @@ TEST_F(GetFilenameByFdTest, ClosedDescriptorHasNone) {
   EXPECT_EQ(Records(), log.records());
 }
 
-// Directories within directories, each made and opened from the one above, since the path of the
-// last is longer than a path may be. Removes them again.
+// Nested directories, each made and opened from the one above, because the path of the last is
+// longer than a path may be. They are removed at the end.
 class DeepDirectory {
  public:
   DeepDirectory(const std::string& top, size_t path_length) {
     fds_.push_back(open(top.c_str(), O_RDONLY | O_DIRECTORY | O_CLOEXEC));
     for (size_t length = top.size(); length < path_length;) {
-      // A remainder of one byte would have room for a slash alone.
+      // A remainder of one byte would only have room for a slash.
       size_t step = std::min<size_t>(path_length - length, 200);
       if (path_length - length - step == 1) --step;
       names_.push_back(std::string(step - 1, 'd'));
@@ -360,7 +360,7 @@ class DeepDirectory {
 
 // ---- Through a descriptor.
 
-TEST_F(ReadFileTest, DescriptorIsReadFromItsStartWhateverThePathLeadsTo) {
+TEST_F(ReadFileTest, DescriptorIsReadFromItsStartIfThePathLeadsElsewhere) {
   const int fd = open(MakeFile("abc").c_str(), O_RDONLY | O_CLOEXEC);
   EXPECT_EQ(2, lseek(fd, 2, SEEK_SET));
   ASSERT_EQ(0, unlink(Path("file").c_str()));
@@ -375,7 +375,7 @@ TEST_F(ReadFileTest, DescriptorIsReadFromItsStartWhateverThePathLeadsTo) {
 }
 
 TEST_F(ReadFileTest, DescriptorOfADirectoryHasNoSizeAndStaysOpen) {
-  const int fd = open(folder_.path().c_str(), O_RDONLY | O_DIRECTORY | O_CLOEXEC);
+  const int fd = open(directory_.path().c_str(), O_RDONLY | O_DIRECTORY | O_CLOEXEC);
   LogCapture log;
   Bytes out;
   EXPECT_FALSE(ReadFile("its name", out, nullptr, fd));
@@ -385,7 +385,7 @@ TEST_F(ReadFileTest, DescriptorOfADirectoryHasNoSizeAndStaysOpen) {
 
 // ---- Its memory.
 
-// That the former memory is gone by then, tests/apk/memory_test.cpp tells.
+// tests/apk/memory_test.cpp checks that the former memory is freed first.
 TEST_F(ReadFileTest, EmptyVectorGetsNoMoreMemoryThanTheFileNeeds) {
   Bytes out(1000);
   out.clear();
@@ -403,7 +403,7 @@ TEST_F(ReadFileTest, EmptyVectorWithMemoryEnoughKeepsIt) {
   EXPECT_EQ(Bytes(1000, 'x'), out);
 }
 
-// ---- Without waiting for a writer, and with waiting for whoever holds a lease.
+// ---- Without waiting for a writer, but with waiting for the holder of a lease.
 
 TEST_F(OpenForReadingTest, FifoNeverWouldBlockForReading) {
   ASSERT_EQ(0, mkfifo(Path("fifo").c_str(), 0600));
@@ -445,12 +445,12 @@ TEST_F(ReadFileTest, LeasedFileIsReadOnceItsHolderGivesItUp) {
   EXPECT_EQ(before, NextDescriptor());
 }
 
-TEST_F(OpenForReadingTest, TellsWhyAFileIsNotOpened) {
+TEST_F(OpenForReadingTest, SetsErrnoIfTheFileIsNotOpened) {
   EXPECT_EQ(-1, OpenForReading(Path("missing").c_str(), 0));
   EXPECT_EQ(ENOENT, errno);
 }
 
-// ---- Which file it is.
+// ---- The identity of the file.
 
 TEST_F(ReadFileTest, TellsTheFilesStateBeforeAByteWasRead) {
   const std::string path = MakeFile("abc");
@@ -473,7 +473,7 @@ TEST_F(ReadFileTest, LeavesTheStateAloneWhenItFails) {
   Bytes out;
   struct stat read = {};
   read.st_ino = 7;
-  EXPECT_FALSE(ReadFile(folder_.path(), out, &read));
+  EXPECT_FALSE(ReadFile(directory_.path(), out, &read));
   EXPECT_FALSE(ReadFile("/nowhere/file", out, &read));
   EXPECT_EQ(read.st_ino, 7u);
 }
@@ -500,8 +500,8 @@ TEST(IsSameFile, EachPartOfTheStateCounts) {
   }
 }
 
-// Neither is a regular file, alike as they may be.
-TEST(IsSameFile, WhatIsNoRegularFileIsNone) {
+// Both states are equal, but not those of a regular file.
+TEST(IsSameFile, FilesThatAreNotRegularAreNotTheSame) {
   struct stat state = {};
   EXPECT_FALSE(IsSameFile(state, state));
   state.st_mode = S_IFDIR | 0700;
@@ -509,26 +509,26 @@ TEST(IsSameFile, WhatIsNoRegularFileIsNone) {
 }
 
 TEST_F(GetFilenameByFdTest, TargetPathOf4094BytesIsWhole) {
-  const DeepDirectory deep(folder_.path(), 4094);
+  const DeepDirectory deep(directory_.path(), 4094);
   ASSERT_NE(-1, deep.fd());
   EXPECT_EQ(deep.path(), GetFilenameByFd(deep.fd()));
 }
 
 TEST_F(GetFilenameByFdTest, TargetPathOf4095BytesIsItsFirst4095Bytes) {
-  const DeepDirectory deep(folder_.path(), 4095);
+  const DeepDirectory deep(directory_.path(), 4095);
   ASSERT_NE(-1, deep.fd());
   EXPECT_EQ(4095U, GetFilenameByFd(deep.fd()).size());
   EXPECT_EQ(deep.path(), GetFilenameByFd(deep.fd()));
 }
 
-// Linux does not tell a longer path at all: readlink fails with ENAMETOOLONG.
+// Linux does not return a longer path at all: readlink fails with ENAMETOOLONG.
 TEST_F(GetFilenameByFdTest, TargetPathOf4096BytesIsNotToldByTheKernel) {
-  const DeepDirectory deep(folder_.path(), 4096);
+  const DeepDirectory deep(directory_.path(), 4096);
   ASSERT_NE(-1, deep.fd());
   EXPECT_EQ("", GetFilenameByFd(deep.fd()));
 }
 
-TEST_F(GetFilenameByFdTest, OfALongerTargetPathThatIsToldTheFirst4095BytesAreTaken) {
+TEST_F(GetFilenameByFdTest, ALongerTargetPathIsItsFirst4095Bytes) {
   std::string target(5000, 'a');
   target[4094] = 'y';
   target[4095] = 'z';

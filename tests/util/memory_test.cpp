@@ -12,17 +12,17 @@ size_t AllOfTheMachine() {
   return static_cast<size_t>(sysconf(_SC_PHYS_PAGES)) * static_cast<size_t>(sysconf(_SC_PAGESIZE));
 }
 
-TEST(FitsInMemory, NothingAndAPageDo) {
+TEST(FitsInMemory, NothingAndOnePageFit) {
   EXPECT_TRUE(FitsInMemory(0));
   EXPECT_TRUE(FitsInMemory(static_cast<size_t>(sysconf(_SC_PAGESIZE))));
 }
 
-TEST(FitsInMemory, AllOfTheMachineAndMoreDoNot) {
+TEST(FitsInMemory, AllMemoryOfTheMachineAndMoreDoNot) {
   EXPECT_FALSE(FitsInMemory(AllOfTheMachine()));
   EXPECT_FALSE(FitsInMemory(SIZE_MAX));
 }
 
-// The addresses that the process has taken, in bytes.
+// The address space that the process uses, in bytes.
 size_t AddressesTaken() {
   size_t pages = 0;
   std::ifstream("/proc/self/statm") >> pages;
@@ -30,7 +30,7 @@ size_t AddressesTaken() {
   return pages * static_cast<size_t>(sysconf(_SC_PAGESIZE));
 }
 
-TEST(FitsInMemory, WhatWasTriedIsGivenBack) {
+TEST(FitsInMemory, TheTrialMemoryIsFreed) {
   const size_t size = AllOfTheMachine() / 2;
   const size_t before = AddressesTaken();
   ASSERT_TRUE(FitsInMemory(size));

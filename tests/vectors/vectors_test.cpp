@@ -1,6 +1,6 @@
-// rsa_pkcs1_verify on vectors in the format of Project Wycheproof's rsa_signature_*_test.json: the
-// project's own, Wycheproof's for SHA-256 and keys of 2048 and 3072 bits, and those of a folder
-// that was named when the build was configured.
+// Tests rsa_pkcs1_verify on vectors in the format of Project Wycheproof's
+// rsa_signature_*_test.json: the project's own, Wycheproof's for SHA-256 and keys of 2048 and 3072
+// bits, and those of a directory that the build was configured with.
 #include <gtest/gtest.h>
 #include <openssl/bn.h>
 #include <openssl/nid.h>
@@ -22,20 +22,20 @@ namespace {
 
 using nlohmann::json;
 
-// Where the tool's rules differ from the vectors'. The first flag is the project's own: what
-// carries it is invalid by the standard, and accepted on purpose. The second is Wycheproof's: the
-// signature is made over another digest than the key is for, which is good enough for a tool that
-// lets the signature say which digest it is, as long as that is one it knows.
+// Flags of vectors where the tool's rules differ. The first is the project's own: these vectors are
+// invalid by the standard and accepted on purpose. The second is Wycheproof's: the signature is
+// made over another digest than the key is for. The tool accepts any digest that it knows, because
+// the signature itself names its digest.
 constexpr char kAcceptedShortPadding[] = "AcceptedShortPadding";
 constexpr char kWrongHash[] = "WrongHash";
 
-// The digests that the tool knows; a signature over another is refused, however good it is.
+// The digests that the tool knows. It refuses a signature over any other digest, even a good one.
 constexpr const char* kDigests[] = {"MD5", "SHA-1", "SHA-256"};
 
 struct Counts {
   int valid = 0, wrong_hash = 0, lenient = 0, acceptable = 0;  // those that verify
   int refused = 0;
-  // Signatures of another length than the modulus: the length is the caller's concern.
+  // Signatures of another length than the modulus. The caller checks the length.
   int other_length = 0;
 
   bool operator==(const Counts& other) const {
@@ -65,7 +65,7 @@ Bytes WithoutLeadingZeros(Bytes number) {
 
 class Key {
  public:
-  // The older form of a group has "n" and "e" itself, the newer one in "publicKey".
+  // An older group has "n" and "e" itself, a newer one in "publicKey".
   explicit Key(const json& group) {
     const bool is_newer = group.contains("publicKey") && group["publicKey"].is_object();
     const json& key = is_newer ? group["publicKey"] : group;
@@ -79,14 +79,14 @@ class Key {
   }
 
   size_t size() const { return modulus_.size(); }
-  // Whether the exponent is one that the tool can hold.
+  // True if the tool can hold the exponent.
   bool is_usable() const { return is_usable_; }
   bool Verifies(const Bytes& message, const Bytes& signature) const {
     return rsa_pkcs1_verify(&context_, DigestOf(Digest::kSha1, message).data(),
                             DigestOf(Digest::kSha256, message).data(),
                             DigestOf(Digest::kMd5, message).data(), signature.data()) == 0;
   }
-  // Whether libcrypto finds the signature good for any of the three digests.
+  // True if libcrypto finds the signature good for any of the three digests.
   bool IsGoodForSomeDigest(const Bytes& message, const Bytes& signature) const {
     const bssl::UniquePtr<RSA> key(RSA_new());
     const bssl::UniquePtr<BIGNUM> e(BN_new());
@@ -173,7 +173,7 @@ TEST(Vectors, OfThisProjectAreJudgedAsTheySay) {
   EXPECT_EQ(JudgeFile(VECTORS_DIR "/rsa_signature_apktoolkit_test.json"), Of(16, 0, 9, 127, 0));
 }
 
-TEST(Vectors, OfThisProjectAreWhatTheirRecipeMakes) {
+TEST(Vectors, OfThisProjectAreMadeByTheirRecipe) {
   EXPECT_TRUE(RunProcess({VECTORS_DIR "/make_vectors"}).output ==
               ContentOf(VECTORS_DIR "/rsa_signature_apktoolkit_test.json"));
 }
@@ -186,28 +186,28 @@ TEST(Vectors, OfWycheproofFor3072BitsAreJudgedAsTheySay) {
   EXPECT_EQ(JudgeFile(VECTORS_DIR "/wycheproof_3072_sha256.json"), Of(8, 2, 0, 247, 2));
 }
 
-// The folder that was named: none, and there are no such tests.
-std::vector<std::string> NamesInTheFolder() {
+// The files in the configured directory. Without one there are no such tests.
+std::vector<std::string> NamesInTheDirectory() {
   std::vector<std::string> names;
-  const std::filesystem::path folder = WYCHEPROOF_DIR;
-  if (folder.empty()) return names;
-  for (const auto& entry : std::filesystem::directory_iterator(folder)) {
+  const std::filesystem::path directory = WYCHEPROOF_DIR;
+  if (directory.empty()) return names;
+  for (const auto& entry : std::filesystem::directory_iterator(directory)) {
     const std::string name = entry.path().stem();
     if (name.rfind("rsa_signature_", 0) == 0) names.push_back(name);
   }
   return names;
 }
 
-class VectorsOfTheFolder : public testing::TestWithParam<std::string> {
+class VectorsOfTheDirectory : public testing::TestWithParam<std::string> {
  protected:
   const std::string file_ = WYCHEPROOF_DIR "/" + GetParam() + ".json";
 };
-GTEST_ALLOW_UNINSTANTIATED_PARAMETERIZED_TEST(VectorsOfTheFolder);
-INSTANTIATE_TEST_SUITE_P(Files, VectorsOfTheFolder, testing::ValuesIn(NamesInTheFolder()),
+GTEST_ALLOW_UNINSTANTIATED_PARAMETERIZED_TEST(VectorsOfTheDirectory);
+INSTANTIATE_TEST_SUITE_P(Files, VectorsOfTheDirectory, testing::ValuesIn(NamesInTheDirectory()),
                          [](const auto& parameter) { return parameter.param; });
 
-// Of an original whose numbers are part of the project these are what the recipe takes.
-TEST_P(VectorsOfTheFolder, AreJudgedAsTheySay) {
+// If the project keeps a part of this file, the recipe must take that part from it.
+TEST_P(VectorsOfTheDirectory, AreJudgedAsTheySay) {
   EXPECT_GT(JudgeFile(file_).refused, 0);
   std::string kept = GetParam() + ".json";
   kept.replace(0, strlen("rsa_signature_"), VECTORS_DIR "/wycheproof_");

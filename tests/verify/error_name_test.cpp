@@ -5,7 +5,7 @@
 #include <climits>
 #include <cstring>
 
-// The C library names every number up to the highest that a system call can answer.
+// The C library names every number up to the highest that a system call can return.
 TEST(ErrorName, IsTheNameThatTheCLibraryHas) {
   constexpr int kLast = 4095;
   int named = 0;
@@ -17,6 +17,6 @@ TEST(ErrorName, IsTheNameThatTheCLibraryHas) {
   EXPECT_EQ(named, 131);  // in include/uapi/asm-generic of Linux: 1 to 133 without 41 and 58
 }
 
-TEST(ErrorName, OfWhatIsNoErrorIsADash) {
+TEST(ErrorName, OfAnUnknownNumberIsADash) {
   for (const int error : {0, -1, -126, INT_MIN, INT_MAX}) EXPECT_EQ(ErrorName(error), "-") << error;
 }

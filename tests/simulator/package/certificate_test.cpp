@@ -40,6 +40,7 @@ TEST(CertificateFacts, OfAnRsaKey) {
   const auto facts = ParseCertificate(View(der));
   ASSERT_TRUE(facts.has_value());
   EXPECT_EQ(facts->sha256, Told(der, "sha256sum <\"$0\" | cut -d' ' -f1"));
+  EXPECT_EQ(facts->sha1, Told(der, "sha1sum <\"$0\" | cut -d' ' -f1"));
   EXPECT_EQ(facts->key.algorithm, "RSA");
   EXPECT_EQ(facts->key.bits, 2048);
   EXPECT_EQ(facts->key.sha256,
@@ -55,6 +56,30 @@ TEST(CertificateFacts, OfAnRsaKey) {
   EXPECT_EQ(facts->subject, "CN=Test");
   EXPECT_EQ(facts->issuer, "CN=Test");
   EXPECT_TRUE(facts->is_self_issued);
+}
+
+// Before 1970 and after 2049 as well (RFC 5280 §4.1.2.5), as openssl and date have it.
+TEST(CertificateFacts, LastSecond) {
+  const auto last = [](uint8_t tag, const std::string& end) {
+    Certificate certificate = Of("rsa-2048");
+    certificate.validity =
+        der::Sequence({der::Element(der::kUtcTime, "500102030405Z"), der::Element(tag, end)});
+    const Bytes made = certificate.Build();
+    const auto facts = ParseCertificate(View(made));
+    const std::string told = facts->not_after ? std::to_string(*facts->not_after) : "none";
+    const std::string command =
+        "date +%s -d \"$(openssl x509 -inform DER -in \"$0\" -noout -enddate | sed s/.*=//)\"";
+    if (facts->not_after) {
+      EXPECT_EQ(told, Told(made, command)) << end;
+    }
+    return told;
+  };
+  constexpr uint8_t kGeneralizedTime = 0x18;
+  EXPECT_EQ(last(der::kUtcTime, "700101000001Z"), "1");
+  EXPECT_EQ(last(der::kUtcTime, "490102030405Z"), "2493169445");
+  EXPECT_EQ(last(der::kUtcTime, "690101000000Z").substr(0, 1), "-");
+  EXPECT_EQ(last(kGeneralizedTime, "99991231235959Z"), "253402300799");
+  EXPECT_EQ(last(der::kUtcTime, "no time"), "none");
 }
 
 TEST(CertificateFacts, OfAnEcKey) {

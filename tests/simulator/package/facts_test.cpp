@@ -35,6 +35,14 @@ std::vector<std::string> NamesWhere(const PackageFacts& facts, Predicate holds) 
 
 }  // namespace
 
+// As sha256sum prints it: printf 'no archive\n' | sha256sum.
+TEST(PackageFacts, HaveTheDigestOfTheFile) {
+  const Bytes content = ToBytes("no archive\n");
+  EXPECT_EQ(FactsOf(content).sha256,
+            "cfa9d62752dbe09c9131c8d75dfdf852b5a57f3725c9b639710ea6a68b33f288");
+  EXPECT_EQ(LookAt(DiskFile(content).path(), [] { return true; }).sha256, "");
+}
+
 // mknod makes a socket of it that nobody listens at.
 TEST(FileKind, OfWhatCannotBeOpenedIsNotTold) {
   const TempDir folder;
@@ -136,6 +144,50 @@ TEST(PackageFacts, ListedAreTheEntriesThatTheToolFindsADigestFor) {
   const PackageFacts facts = FactsOf(MakePackage(options).Build());
   EXPECT_EQ(NamesWhere(facts, [](const auto& e) { return e.is_listed; }),
             std::vector<std::string>({"a", "c"}));
+}
+
+TEST(PackageFacts, EntriesWithSha1DigestsAreThoseThatTheToolReadsSo) {
+  PackageOptions options = WithManifest(
+      "Manifest-Version: 1.0\r\n\r\nName: a\r\nSHA1-Digest: x\r\n\r\n"
+      "Name: b\r\nSHA-256-Digest: x\r\n\r\nName: c\r\nMD5-Digest: y\r\n\r\n");
+  for (const char* name : {"a", "b", "c", "d"}) options.entries.push_back({name, ToBytes("x")});
+  const PackageFacts facts = FactsOf(MakePackage(options).Build());
+  EXPECT_EQ(NamesWhere(facts, [](const auto& e) { return e.has_sha1; }),
+            std::vector<std::string>({"a"}));
+}
+
+// The digests are those of "x", as coreutils and xxd print them: printf x | sha256sum | xxd -r -p |
+// base64, and the same with sha1sum.
+TEST(PackageFacts, EachListedEntryIsComparedWithItsDigest) {
+  const std::string manifest =
+      "Manifest-Version: 1.0\r\n\r\n"
+      "Name: same\r\nSHA-256-Digest: LXEWQrcmsEQBYnyp+6wy9chTD7GQPMTbAiWHF5IaSIE=\r\n\r\n"
+      "Name: same1\r\nSHA1-Digest: EfatjsUqKYSrqv18O1FlA3hcIHI=\r\n\r\n"
+      "Name: other\r\nSHA-256-Digest: LXEWQrcmsEQBYnyp+6wy9chTD7GQPMTbAiWHF5IaSIE=\r\n\r\n"
+      "Name: unknown\r\nSHA-512-Digest: AAAA\r\n\r\n"
+      "Name: gone\r\nSHA-256-Digest: AAAA\r\n\r\n"
+      "Name: gone\r\nSHA-256-Digest: AAAA\r\n\r\n"
+      "Name: damaged\r\nSHA-256-Digest: AAAA\r\n\r\n";
+  PackageOptions options = WithManifest(manifest);
+  options.entries = {{"same", ToBytes("x")},  {"same1", ToBytes("x")},
+                     {"other", ToBytes("y")}, {"unknown", ToBytes("x")},
+                     {"added", ToBytes("x")}, {"damaged", ToBytes("long")}};
+  Package package = MakePackage(options);
+  package.Item("damaged").local.crc = 1;
+  const DiskFile file(package.Build());
+  const auto with = [](const PackageFacts& facts, EntryDigest digest) {
+    return NamesWhere(facts, [digest](const auto& e) { return e.digest == digest; });
+  };
+  const PackageFacts facts = LookAt(file.path());
+  EXPECT_EQ(with(facts, EntryDigest::kMatches), std::vector<std::string>({"same", "same1"}));
+  EXPECT_EQ(with(facts, EntryDigest::kDiffers), std::vector<std::string>({"other"}));
+  EXPECT_EQ(with(facts, EntryDigest::kNotCompared),
+            std::vector<std::string>({"damaged", "unknown"}));
+  EXPECT_EQ(facts.missing, std::vector<std::string>({"gone"}));
+  // Nothing is called the same that nobody had time to compare.
+  const PackageFacts late = LookAt(file.path(), [] { return true; });
+  EXPECT_EQ(with(late, EntryDigest::kMatches), std::vector<std::string>());
+  EXPECT_EQ(with(late, EntryDigest::kNotCompared).size(), 5U);
 }
 
 // What lies below a directory of META-INF is an entry like others.

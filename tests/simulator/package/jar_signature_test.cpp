@@ -155,6 +155,20 @@ TEST(SignatureFile, SaysWhichOtherSchemesThereAre) {
   EXPECT_EQ(claimed("no signature file"), "");
 }
 
+// The first section that has one counts, and of its digests the one that the tool takes.
+TEST(SignatureFile, MayHaveTheManifestsSha1Digest) {
+  const auto has_sha1 = [](const std::string& text) {
+    PackageOptions options;
+    options.edit_signature_file = [&text](const std::string&) { return text; };
+    return SignatureOf(MakePackage(options)).has_sha1_of_manifest;
+  };
+  EXPECT_TRUE(has_sha1("SHA1-Digest-Manifest: x\r\n\r\n"));
+  EXPECT_TRUE(has_sha1("A: 1\r\n\r\nSHA1-Digest-Manifest: x\r\n\r\n"));
+  EXPECT_FALSE(has_sha1("SHA-256-Digest-Manifest: x\r\n\r\nSHA1-Digest-Manifest: x\r\n\r\n"));
+  EXPECT_FALSE(has_sha1("SHA-512-Digest-Manifest: x\r\n\r\n"));
+  EXPECT_FALSE(has_sha1("SHA1-Digest-Manifest-Main-Attributes: x\r\n\r\n"));
+}
+
 TEST(SignatureFile, StatesADigestOfTheManifest) {
   const auto states = [](const std::string& text) {
     PackageOptions options;

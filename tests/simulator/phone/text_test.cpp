@@ -26,8 +26,9 @@ TEST(JournalText, QuotesBackslashesAndControlsAreEscaped) {
 }
 
 TEST(JournalText, Utf8StaysAsItIs) {
-  // The first and the last character of two, three and four bytes, around the surrogates.
-  for (const std::string text : {"\u00a0", "\u07ff", "\u0800", "\ud7ff", "\ue000", "\uffff",
+  // The first and the last character of two, three and four bytes, around the surrogates; U+FFFE
+  // and U+FFFF are none.
+  for (const std::string text : {"\u00a0", "\u07ff", "\u0800", "\ud7ff", "\ue000", "\ufffd",
                                  "\U00010000", "\U0010ffff", "\uf77f", "\uf800"}) {
     EXPECT_EQ(EncodeText(text), "\"" + text + "\"");
   }
@@ -38,15 +39,16 @@ TEST(JournalText, HiddenCharactersAreEscaped) {
   EXPECT_EQ(EncodeText("\u0080\u009f\u00ad\u061c\u180e"), R"("\u0080\u009f\u00ad\u061c\u180e")");
   EXPECT_EQ(EncodeText("\u200b\u200f\u2028\u202e\u2060\u206f"),
             R"("\u200b\u200f\u2028\u202e\u2060\u206f")");
-  EXPECT_EQ(EncodeText("\ufeff\ufff9\ufffb"), R"("\ufeff\ufff9\ufffb")");
+  EXPECT_EQ(EncodeText("\ufeff\ufff9\ufffb\ufffe\uffff"), R"("\ufeff\ufff9\ufffb\ufffe\uffff")");
   EXPECT_EQ(EncodeText("\U000e0000\U000e007f"), R"("\udb40\udc00\udb40\udc7f")");
   EXPECT_EQ(EncodeText("\x1f\x7f"), R"("\u001f\u007f")");
 }
 
 TEST(JournalText, NeighboursOfHiddenCharactersStay) {
   for (const std::string text :
-       {" ", "~", "\u00a0", "\u00ac", "\u00ae", "\u061b", "\u061d", "\u200a", "\u2010", "\u2027",
-        "\u202f", "\u205f", "\u2070", "\ufefe", "\uff00", "\ufff8", "\ufffc", "\U000e0080"}) {
+       {" ",      "~",      "\u00a0", "\u00ac", "\u00ae",     "\u061b",    "\u061d",
+        "\u200a", "\u2010", "\u2027", "\u202f", "\u205f",     "\u2070",    "\ufefe",
+        "\uff00", "\ufff8", "\ufffc", "\ufffd", "\U00010000", "\U000e0080"}) {
     EXPECT_EQ(EncodeText(text), "\"" + text + "\"");
   }
 }

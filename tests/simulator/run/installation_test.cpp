@@ -30,7 +30,7 @@ std::vector<std::string> LaidOutOf(const PackageOptions& package, InstalledAbi a
   const std::string file = folder / "base.apk";
   MakePackage(package).WriteTo(file);
   Installation installation;
-  EXPECT_EQ(installation.LayOut(file, abi, kLater), std::nullopt);
+  EXPECT_EQ(installation.LayOut(file, InstallWhen::kAlways, abi, kLater), std::nullopt);
   if (left_out != nullptr) *left_out = installation.left_out();
   const fs::path place = fs::path(installation.path()).parent_path();
   std::vector<std::string> files;
@@ -138,8 +138,8 @@ TEST(Installation, OfAFileThatShrinksMeanwhileIsNone) {
       EXPECT_EQ(truncate(file.c_str(), 3000), 0);
     });
     Installation installation;
-    is_told =
-        installation.LayOut(file, InstalledAbi::kAll, kLater) == "it became shorter meanwhile";
+    is_told = installation.LayOut(file, InstallWhen::kAlways, InstalledAbi::kAll, kLater) ==
+              "it became shorter meanwhile";
     cutter.join();
   }
   EXPECT_TRUE(is_told);
@@ -160,7 +160,8 @@ TEST(Installation, TellsWhatCannotBeExtracted) {
   const ZipItem good = {"lib/arm64-v8a/liba.so", ToBytes("good")};
   MakePackage(WithLibraries({undeflatable, good, unknown, crc, size})).WriteTo(file);
   Installation installation;
-  EXPECT_EQ(installation.LayOut(file, InstalledAbi::kAll, kLater), std::nullopt);
+  EXPECT_EQ(installation.LayOut(file, InstallWhen::kAlways, InstalledAbi::kAll, kLater),
+            std::nullopt);
   Files lost = installation.not_extracted();
   std::sort(lost.begin(), lost.end());
   EXPECT_EQ(lost, Files({crc.name, undeflatable.name, unknown.name, size.name}));
@@ -176,7 +177,8 @@ TEST(Installation, OfAFileThatIsCalledAsALibrarysDirectory) {
   const std::string file = folder / "lib";
   MakePackage().WriteTo(file);
   Installation installation;
-  EXPECT_EQ(installation.LayOut(file, InstalledAbi::kAll, kLater), std::nullopt);
+  EXPECT_EQ(installation.LayOut(file, InstallWhen::kAlways, InstalledAbi::kAll, kLater),
+            std::nullopt);
   const fs::path place = fs::path(installation.path()).parent_path();
   EXPECT_EQ(installation.path(), place / "base.apk");
   EXPECT_EQ(ContentOf(place / "lib/arm64/libfoo.so"), "\177ELF foo");
@@ -194,7 +196,8 @@ TEST(Installation, SaysWhenItCannotWrite) {
     signal(SIGXFSZ, SIG_IGN);
     setrlimit(RLIMIT_FSIZE, &limit);
     Installation installation;
-    const auto problem = installation.LayOut(file, InstalledAbi::kAll, kLater);
+    const auto problem =
+        installation.LayOut(file, InstallWhen::kAlways, InstalledAbi::kAll, kLater);
     setrlimit(RLIMIT_FSIZE, &before);
     EXPECT_TRUE(installation.not_extracted().empty());
     return problem.value_or("");
@@ -213,7 +216,8 @@ TEST(Installation, DoesNotWaitForWhoHoldsALease) {
   const int holder = open(file.c_str(), O_RDWR);
   ASSERT_EQ(fcntl(holder, F_SETLEASE, F_WRLCK), 0);
   Installation installation;
-  EXPECT_EQ(installation.LayOut(file, InstalledAbi::kAll, kLater), std::nullopt);
+  EXPECT_EQ(installation.LayOut(file, InstallWhen::kAlways, InstalledAbi::kAll, kLater),
+            std::nullopt);
   EXPECT_EQ(installation.path(), file);
   close(holder);
 }
@@ -225,7 +229,8 @@ TEST(Installation, IsGoneWithItsOwner) {
   std::string path;
   {
     Installation installation;
-    ASSERT_EQ(installation.LayOut(file, InstalledAbi::kPreferred, kLater), std::nullopt);
+    ASSERT_EQ(installation.LayOut(file, InstallWhen::kAlways, InstalledAbi::kPreferred, kLater),
+              std::nullopt);
     path = installation.path();
     ASSERT_NE(path, file);
     EXPECT_TRUE(fs::exists(path));
@@ -244,11 +249,13 @@ TEST(Installation, OfAFileThatCannotBeLinkedIsACopyAndNotForEver) {
   ASSERT_EQ(write(memory, package.data(), package.size()), static_cast<ssize_t>(package.size()));
   const std::string file = "/proc/self/fd/" + std::to_string(memory);
   Installation copied;
-  EXPECT_EQ(copied.LayOut(file, InstalledAbi::kPreferred, kLater), std::nullopt);
+  EXPECT_EQ(copied.LayOut(file, InstallWhen::kAlways, InstalledAbi::kPreferred, kLater),
+            std::nullopt);
   EXPECT_NE(copied.path(), file);
   EXPECT_EQ(ContentOf(copied.path()), package);
   Installation late;
-  const auto problem = late.LayOut(file, InstalledAbi::kPreferred, Deadline(0));
+  const auto problem =
+      late.LayOut(file, InstallWhen::kAlways, InstalledAbi::kPreferred, Deadline(0));
   close(memory);
   ASSERT_TRUE(problem.has_value());
   EXPECT_NE(problem->find("Connection timed out"), std::string::npos) << *problem;
@@ -260,7 +267,8 @@ TEST(Installation, LeavesOtherFilesWhereTheyAre) {
        {folder.path(), folder / "none", folder.Write("note.txt", ToBytes("text")),
         std::string("/dev/zero")}) {
     Installation installation;
-    EXPECT_EQ(installation.LayOut(file, InstalledAbi::kAll, kLater), std::nullopt);
+    EXPECT_EQ(installation.LayOut(file, InstallWhen::kAlways, InstalledAbi::kAll, kLater),
+              std::nullopt);
     EXPECT_EQ(installation.path(), file);
   }
 }
@@ -273,7 +281,8 @@ TEST(Installation, SaysWhenThereIsNoPlaceForIt) {
   const std::string kept = before == nullptr ? "/tmp" : before;
   ASSERT_EQ(setenv("TMPDIR", "/nowhere", 1), 0);
   Installation installation;
-  const auto problem = installation.LayOut(file, InstalledAbi::kPreferred, kLater);
+  const auto problem =
+      installation.LayOut(file, InstallWhen::kAlways, InstalledAbi::kPreferred, kLater);
   setenv("TMPDIR", kept.c_str(), 1);
   EXPECT_TRUE(problem.has_value());
 }
@@ -286,8 +295,81 @@ TEST(Installation, EndsWhenTheProcessIsToEnd) {
   const auto lay_out = [&] {
     CatchInterruptions();
     raise(SIGTERM);
-    const auto objection = Installation().LayOut(file, InstalledAbi::kAll, kLater);
+    const auto objection =
+        Installation().LayOut(file, InstallWhen::kAlways, InstalledAbi::kAll, kLater);
     _exit(objection == std::nullopt ? 1 : 0);
   };
   EXPECT_EXIT(lay_out(), testing::ExitedWithCode(0), "");
+}
+
+// ---- A package that lies alone.
+
+TEST(Installation, IsMadeOfAPackageThatLiesAlone) {
+  const TempDir folder;
+  const std::string file = folder / "base.apk";
+  // The tool looks for a library of this ABI in lib/armX.
+  MakePackage(WithLibraries({kBoth[0], {"lib/armeabiX/libx.so", ToBytes("x")}})).WriteTo(file);
+  const auto is_laid_out = [&file](InstallWhen when) {
+    Installation installation;
+    EXPECT_EQ(installation.LayOut(file, when, InstalledAbi::kPreferred, kLater), std::nullopt);
+    EXPECT_EQ(installation.is_done(), installation.path() != file);
+    return installation.is_done();
+  };
+  EXPECT_TRUE(is_laid_out(InstallWhen::kAlone));
+  EXPECT_FALSE(is_laid_out(InstallWhen::kNever));
+  for (const char* place : {"lib/arm64", "lib/arm", "lib/armX/libx.so"}) {
+    fs::create_directories(folder / place);
+    EXPECT_FALSE(is_laid_out(InstallWhen::kAlone)) << place;
+    EXPECT_TRUE(is_laid_out(InstallWhen::kAlways)) << place;
+    fs::remove_all(folder / "lib");
+  }
+  // Nobody can tell whether there is one.
+  fs::create_symlink("lib", folder / "lib");
+  EXPECT_FALSE(is_laid_out(InstallWhen::kAlone));
+}
+
+TEST(Installation, LeavesAJarWithLibrariesWhereItIs) {
+  const TempDir folder;
+  const std::string file = folder / "a.jar";
+  Package package = MakePackage();
+  package.items.erase(
+      std::remove_if(package.items.begin(), package.items.end(),
+                     [](const ZipItem& item) { return item.name == "AndroidManifest.xml"; }),
+      package.items.end());
+  package.WriteTo(file);
+  Installation installation;
+  EXPECT_EQ(installation.LayOut(file, InstallWhen::kAlways, InstalledAbi::kAll, kLater),
+            std::nullopt);
+  EXPECT_EQ(installation.path(), file);
+}
+
+TEST(Installation, NamesTheLibrariesOfOtherProcessors) {
+  const TempDir folder;
+  const std::string file = folder / "base.apk";
+  MakePackage(WithLibraries(kBoth)).WriteTo(file);
+  const auto others = [&file](InstalledAbi abi) {
+    Installation installation;
+    EXPECT_EQ(installation.LayOut(file, InstallWhen::kAlways, abi, kLater), std::nullopt);
+    return installation.of_other_processors();
+  };
+  EXPECT_EQ(others(InstalledAbi::kPreferred),
+            std::set<std::string>({"lib/armeabi-v7a/liba.so", "lib/armeabi/liba.so"}));
+  EXPECT_EQ(others(InstalledAbi::kArm),
+            std::set<std::string>({"lib/arm64-v8a/liba.so", "lib/armeabi/liba.so"}));
+  EXPECT_EQ(others(InstalledAbi::kAll), std::set<std::string>({"lib/armeabi/liba.so"}));
+}
+
+TEST(Installation, ItsPathsAreStable) {
+  const TempDir folder;
+  const std::string file = folder / "base.apk";
+  MakePackage(WithLibraries({kBoth[0]})).WriteTo(file);
+  Installation installation;
+  EXPECT_EQ(installation.WithStablePaths("/x/base.apk"), "/x/base.apk");
+  ASSERT_EQ(installation.LayOut(file, InstallWhen::kAlways, InstalledAbi::kPreferred, kLater),
+            std::nullopt);
+  const std::string place = fs::path(installation.path()).parent_path().string();
+  EXPECT_EQ(installation.WithStablePaths("a " + place + "/lib/x.so b " + place + "/base.apk"),
+            "a <install>/lib/x.so b <install>/base.apk");
+  // It is the directory's own name alone that is another in each run.
+  EXPECT_EQ(installation.WithStablePaths(place + "x/<install>/lib"), place + "x/<install>/lib");
 }

@@ -7,8 +7,8 @@
 using namespace simulator;
 
 int main() {
-  Page page;
+  Page page({0, kHostileText});
   page.Add(HostileReport(kHostileText));
   page.Add(HostileReport(std::string(100'000, 'W')));
-  std::cout << page.Html();
+  std::cout << page.Html(3);
 }

@@ -22,6 +22,16 @@ inline CertificateFacts HostileCertificate(const std::string& text) {
   return certificate;
 }
 
+inline Judgement HostileJudgement(const std::string& text) {
+  Judgement judgement;
+  judgement.state = Judgement::State::kJudged;
+  const InstallerIssue issue = {text, {text}, text};
+  const InstallerSigner signer = {text, HostileCertificate(text)};
+  judgement.ranges = {{{27, 29}, true, {"v1", text}, {signer}, {}, {issue}},
+                      {{30, kNewestLevel}, false, {text}, {signer}, {issue}, {issue}}};
+  return judgement;
+}
+
 // An event of each kind.
 inline Events HostileEvents(const std::string& text) {
   const auto answer = [&text](const char* kind, int64_t result) {
@@ -58,6 +68,8 @@ inline Report HostileReport(const std::string& text) {
   report.protection.signature = {3, 50};
   report.protection.unlisted_names = {text};
   report.file_size = 1000;
+  report.file_sha256 = text;
+  report.installer = HostileJudgement(text);
   report.chain = {{"key", LinkState::kHolds, text},
                   {"certificate", LinkState::kBroken, text},
                   {"manifest", LinkState::kNotReached, text}};

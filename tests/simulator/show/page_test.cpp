@@ -2,6 +2,8 @@
 
 #include <gtest/gtest.h>
 
+#include <ctime>
+#include <optional>
 #include <regex>
 
 #include "simulator/phone/text.h"
@@ -11,8 +13,11 @@ using namespace simulator;
 
 namespace {
 
+// 2026-11-22 09:08:07 UTC, as "date -u -d @1795338487" says it.
+constexpr std::time_t kBegun = 1795338487;
+
 std::string PageOf(const std::vector<Report>& reports) {
-  Page page;
+  Page page({kBegun, ""});
   for (const Report& report : reports) page.Add(report);
   return page.Html();
 }
@@ -98,7 +103,8 @@ TEST(Page, HasNoScriptAndNothingFromElsewhere) {
 
 // A name with markup in it changes nothing but the texts.
 TEST(Page, HasTheSameMarkupWhateverFilesAreCalled) {
-  const std::string plain = PageOf({HostileReport("x"), HostileReport("x")});
+  // The hostile names have a directory as well.
+  const std::string plain = PageOf({HostileReport("x/x"), HostileReport("x/x")});
   const std::string hostile = PageOf({HostileReport(kHostileText), HostileReport(kHostileText)});
   EXPECT_EQ(TagsOf(hostile), TagsOf(plain));
   EXPECT_GT(Count(hostile, "&lt;script&gt;"), 70U);
@@ -181,20 +187,23 @@ TEST(Page, CutsNoCharacterInTwo) {
   EXPECT_TRUE(Has(PageOf(report), "a€…<"));
 }
 
-TEST(Page, ListsTheFilesWhereThereAreSeveral) {
+TEST(Page, HasATableOfFilesWhereThereAreSeveral) {
   EXPECT_FALSE(Has(PageOf(Example(Verdict::kSigned)), "<nav"));
   const std::string page = PageOf({Example(Verdict::kRefused), Example(Verdict::kTrustedJar)});
   EXPECT_TRUE(Has(page, "<p>2 files: 1 trusted JAR, 1 refused</p>"));
   EXPECT_TRUE(Has(page,
-                  "<li><span class=\"verdict good\">TRUSTED JAR</span> "
-                  "<a class=\"name\" href=\"#file-2\">base.apk</a></li>"));
-  EXPECT_TRUE(Has(page, "<article id=\"file-2\""));
+                  "<tr role=\"row\" class=\"is-trusted-jar\"><td role=\"cell\">"
+                  "<span class=\"verdict good\">TRUSTED JAR</span></td><th role=\"rowheader\" "
+                  "scope=\"row\"><a class=\"name\" href=\"#file-2\">base.apk</a></th>"))
+      << page;
+  EXPECT_TRUE(Has(page, "<article id=\"file-2\" class=\"is-trusted-jar\""));
 }
 
 TEST(Page, LeavesOutWhatThereIsNot) {
   const std::string page = PageOf(Example(Verdict::kNotLookedAt));
   EXPECT_TRUE(Has(page, "NOT LOOKED AT"));
-  for (const char* part : {"<h3", "<svg class=\"bar\"", "<ol", "<table", "<dl"}) {
+  EXPECT_EQ(Count(page, "<h3>"), 1U) << "the file and the run alone";
+  for (const char* part : {"<svg class=\"bar\"", "<ol", "<table", "SHA-256", "size (bytes)"}) {
     EXPECT_FALSE(Has(page, part)) << part;
   }
 }
@@ -269,4 +278,112 @@ TEST(Page, ShowsTheKeyBehindALongName) {
   report.signer->subject = std::string(1000, 'n');
   report.key = {std::string(64, '1'), 2048, true};
   EXPECT_TRUE(Has(PageOf(report), "n…, RSA-2048, key 11111111…111111</p>"));
+}
+
+TEST(Page, SaysOfWhichRunAndProgramsItIs) {
+  Report report = Example(Verdict::kSigned);
+  report.file_size = 1234567;
+  report.file_sha256 = std::string(64, 'd');
+  const std::string page = PageOf({report, report});
+  EXPECT_TRUE(Has(page, "<time datetime=\"2026-11-22T09:08:07Z\">2026-11-22 09:08:07 UTC</time>"));
+  for (const std::string& row :
+       {std::string("<dt>path</dt><dd>/data/app/base.apk</dd>"),
+        std::string("<dt>size (bytes)</dt><dd>1,234,567</dd>"),
+        "<dt>SHA-256 digest</dt><dd>" + report.file_sha256 + "</dd>",
+        std::string("<dt>looked at in the run of</dt><dd>2026-11-22 09:08:07 UTC</dd>"),
+        std::string("<dt>tool</dt><dd>apktoolkit " APKTOOLKIT_VERSION "</dd>"),
+        std::string("<dt>simulator</dt><dd>apktoolkit-sim " APKTOOLKIT_VERSION "</dd>")}) {
+    EXPECT_EQ(Count(page, row), 2U) << row;
+  }
+}
+
+TEST(Page, ClaimsNoVersionOfAToolThatWasNamed) {
+  Page page({kBegun, "/opt/<tool>"});
+  page.Add(Example(Verdict::kSigned));
+  EXPECT_EQ(Count(page.Html(), "/opt/&lt;tool&gt; (--tool; its version is not known)"), 2U);
+  EXPECT_FALSE(Has(page.Html(), "apktoolkit " APKTOOLKIT_VERSION));
+}
+
+TEST(Page, SaysThatTheRunWasInterrupted) {
+  const auto page_of = [](std::optional<size_t> unseen) {
+    Page page({kBegun, ""});
+    page.Add(Example(Verdict::kSigned));
+    page.Add(Example(Verdict::kNotSimulated));
+    return page.Html(unseen);
+  };
+  const std::string page = page_of(7);
+  EXPECT_TRUE(
+      Has(page, "<p>2 files: 1 signed, 1 not simulated; interrupted before 7 more files</p>"));
+  EXPECT_TRUE(Has(page,
+                  "The run was interrupted. 7 files of 9 were not looked at and are not on this "
+                  "page.</p>"));
+  EXPECT_TRUE(Has(page_of(0), "1 not simulated; interrupted</p>"));
+  EXPECT_TRUE(Has(page_of(0), "The run was interrupted.</p>"));
+  EXPECT_FALSE(Has(page_of({}), "interrupted"));
+}
+
+TEST(Page, PutsTheToolAndTheInstallerSideBySide) {
+  Report report = Example(Verdict::kNotInstallable);
+  report.chain = {{"key", LinkState::kHolds, "RSA-2048"}};
+  report.items = {Library("lib/arm/a.so", nullptr)};
+  report.signer.emplace();
+  report.signer->subject = "CN=Vault";
+  report.key = {std::string(64, 'b'), 2048, true};
+  CertificateFacts other;
+  other.subject = "CN=Other";
+  other.key = {"EC", 256, std::string(64, 'a'), ""};
+  report.installer.state = Judgement::State::kJudged;
+  report.installer.ranges = {
+      {{27, 29}, true, {"v1", "v2"}, {{"v2", other}, {"v2", other}}, {}, {{"W", {}, "a warning"}}},
+      {{30, kNewestLevel}, false, {}, {}, {{"E", {}, "an error"}}, {}}};
+  const std::string page = PageOf(report);
+  const auto row = [](const char* who, const char* mark, const std::string& rest) {
+    return "<tr role=\"row\"><th role=\"rowheader\" scope=\"row\">" + std::string(who) +
+           "</th><td role=\"cell\" class=\"" + mark + rest + "</td></tr>";
+  };
+  const std::string schemes = "</td><td role=\"cell\" class=\"cell-schemes\">";
+  const std::string cell = "</td><td role=\"cell\">";
+  for (const std::string& part :
+       {row("apktoolkit", "good\"><span class=\"mark\" aria-hidden=\"true\">✓</span> signs it",
+            schemes + "v1" + cell + "<p>CN=Vault, RSA-2048, key bbbbbbbb…bbbbbb</p>" + cell),
+        row("phones of API 27 to 29",
+            "good\"><span class=\"mark\" aria-hidden=\"true\">✓</span> take it",
+            schemes + "v1, v2" + cell + "<p>CN=Other, EC-256</p>" + cell +
+                "<p>warning: a warning</p>"),
+        row("phones of API 30 and later",
+            "bad\"><span class=\"mark\" aria-hidden=\"true\">✗</span> refuse it",
+            schemes + cell + cell + "<p>an error</p>")}) {
+    EXPECT_TRUE(Has(page, part)) << part << "\n" << page;
+  }
+}
+
+TEST(Page, SaysWhereTheInstallerWasNotAskedOrGaveUp) {
+  Report report = Example(Verdict::kRefused);
+  EXPECT_FALSE(Has(PageOf(report), "\"judgements\"")) << "it is no package";
+  report.chain = {{"key", LinkState::kBroken, ""}};
+  report.items = {Library("lib/arm/a.so", &cause::kLibraryChanged)};
+  EXPECT_TRUE(Has(PageOf(report), "</span> were not asked</td>"));
+  EXPECT_TRUE(Has(PageOf(report),
+                  "</span> signs nothing</td><td role=\"cell\" class=\"cell-schemes\"></td><td "
+                  "role=\"cell\"></td><td role=\"cell\"><p>lib/arm/a.so: its bytes are not those "
+                  "that the manifest lists</p></td>"));
+  report.installer.state = Judgement::State::kGaveUp;
+  report.installer.why = "it took too long";
+  report.items.push_back(Library("lib/arm/b.so", nullptr));
+  const std::string page = PageOf(report);
+  EXPECT_TRUE(Has(page, "</span> the verifier gave up</td>"));
+  EXPECT_TRUE(Has(page, "<p>it took too long</p>"));
+  EXPECT_TRUE(Has(page, "</span> signs a part of it</td>"));
+}
+
+// A name of an option, and its value, stay in one piece; nothing of the text is lost.
+TEST(Page, KeepsTheNamesOfOptionsWhole) {
+  Report report = Example(Verdict::kSigned);
+  report.items = {Library("a", &cause::kLibraryNotInstalled)};
+  report.items[0].state = ItemState::kAbsent;
+  EXPECT_TRUE(Has(PageOf(report),
+                  "<p class=\"cure\">Nothing, where the phone is of another kind. For a package "
+                  "that lies alone: <span class=\"option\">--install</span>; for all processors: "
+                  "<span class=\"option\">--install=all</span>.</p>"));
+  EXPECT_TRUE(Has(PageOf(report), ".option { white-space: nowrap; }"));
 }

@@ -56,3 +56,18 @@ TEST(DrawnBar, OfNoEntriesIsNone) {
   const auto empty = DrawBar({{1, 0}, {}, {}, {}, {}}, 0);
   EXPECT_EQ(Percents(empty), std::vector<double>({0, 0, 0, 0, 0}));
 }
+
+TEST(DrawnBar, FaultsTakeALineWhereThereAreAny) {
+  Protection protection = {{1, 400}, {}, {}, {}, {}};
+  protection.differing = {2, 300};
+  protection.uncompared = {1, 200};
+  protection.missing_names = {"a", "b", "c"};
+  std::string codes;
+  for (const DrawnPart& part : DrawBar(protection, 1000)) {
+    codes += part.code + std::string(" ") + std::to_string(part.share.entries) + ", ";
+  }
+  EXPECT_EQ(codes,
+            "verified 1, vouched 0, differing 2, uncompared 1, missing 3, unlisted 0, signature 0, "
+            "between 0, ");
+  EXPECT_EQ(Percents(DrawBar(protection, 1000))[2], 30);
+}

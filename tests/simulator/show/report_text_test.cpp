@@ -60,16 +60,18 @@ CertificateFacts Signer() {
 }  // namespace
 
 TEST(ReportText, HasTheVerdictTheItemsAndWhatToDo) {
-  EXPECT_EQ(Printed(Example()),
-            "PARTLY SIGNED  base.apk   com.example.vault\n"
-            "  ✓ package                 signed with the payload of that key\n"
-            "  ✓ lib/arm/libvault.so     signed\n"
-            "  ✗ lib/arm64/libvault.so   not signed: its bytes are not those that the manifest "
-            "lists\n"
-            "      The file beside the package was changed after it was installed. Install\n"
-            "      the package again.\n"
-            "  – lib/x86_64/libvault.so  nothing to sign: no phone of this kind installs it\n"
-            "  ✓ key                     registered for com.example.vault\n");
+  EXPECT_EQ(
+      Printed(Example()),
+      "PARTLY SIGNED  base.apk   lib/arm64/libvault.so: its bytes are not those that the manifest "
+      "lists\n"
+      "  ✓ package                 signed with the payload of that key\n"
+      "  ✓ lib/arm/libvault.so     signed\n"
+      "  ✗ lib/arm64/libvault.so   not signed: its bytes are not those that the manifest "
+      "lists\n"
+      "      The file beside the package was changed after it was installed. Install\n"
+      "      the package again.\n"
+      "  – lib/x86_64/libvault.so  nothing to sign: no phone of this kind installs it\n"
+      "  ✓ key                     registered for com.example.vault\n");
 }
 
 TEST(ReportText, MarksArePlainWhereNoOthersCanBeShown) {
@@ -110,8 +112,10 @@ TEST(ReportText, SignerStandsAsApksignerPrintsIt) {
 }
 
 TEST(ReportText, QuietIsTheVerdictAlone) {
-  EXPECT_EQ(Printed(Example(), kUtf8, Detail::kVerdict),
-            "PARTLY SIGNED  base.apk   com.example.vault\n");
+  EXPECT_EQ(
+      Printed(Example(), kUtf8, Detail::kVerdict),
+      "PARTLY SIGNED  base.apk   lib/arm64/libvault.so: its bytes are not those that the manifest "
+      "lists\n");
 }
 
 TEST(ReportText, VerboseNamesWhatIsNotListedAndTheChain) {
@@ -139,7 +143,7 @@ TEST(ReportText, WarningsStandOut) {
   report.warnings = {{&cause::kSchemesStripped, "v2"}};
   EXPECT_EQ(
       Printed(report, {true, true}),
-      "\x1b[33mPARTLY SIGNED\x1b[0m  base.apk   com.example.vault\n"
+      "\x1b[33mPARTLY SIGNED\x1b[0m  base.apk   com.example.vault   1 warning\n"
       "\x1b[33m  ! the signature file says that the package is signed with v2 as well, and it "
       "is not: phones do not install it\x1b[0m\n"
       "      Sign the package again, as the last step that changes it.\n");

@@ -92,7 +92,71 @@ TEST(HeadFacts, SoundTheAlarmsAndNoOtherWarnings) {
   report.warnings = {{&cause::kUnlistedEntries, "x"}, {&cause::kBlockAmbiguous, "why"}};
   EXPECT_EQ(HeadFacts(report, "..."),
             Lines({"! others may read another signer in its signature block than the tool does: "
-                   "why"}));
+                   "why",
+                   "2 warnings"}));
+  report.warnings.erase(report.warnings.begin());
+  EXPECT_EQ(HeadFacts(report, "...").back(), "1 warning");
+}
+
+TEST(HeadFacts, HaveTheReasonInPlaceOfTheSigner) {
+  Report report = WithSigner();
+  report.verdict = Verdict::kPartlySigned;
+  report.items = {
+      {ItemKind::kPackage, "package", "", ItemState::kDone, {}},
+      Library(&cause::kLibraryMissing),
+      {ItemKind::kKey, "com.app", "", ItemState::kRefused, {&cause::kRegistrationRefused, "7"}}};
+  EXPECT_EQ(HeadFacts(report, "..."),
+            Lines({"lib/arm64/a.so: it does not lie beside the package, where others are"}));
+  report.items[1].state = ItemState::kAbsent;
+  EXPECT_EQ(HeadFacts(report, "..."), Lines({"libzu answered 7"}));
+}
+
+// What the tool refused besides is not why phones do not install it.
+TEST(HeadFacts, HaveTheInstallersReasonWhereTheVerdictIsHis) {
+  Report report = WithSigner();
+  report.verdict = Verdict::kNotInstallable;
+  report.items = {Library(&cause::kLibraryMissing),
+                  {ItemKind::kInstaller,
+                   "installer",
+                   "",
+                   ItemState::kRefused,
+                   {&cause::kNotInstallable, "why"}}};
+  EXPECT_EQ(HeadFacts(report, "..."), Lines({"phones do not install it: why"}));
+}
+
+// Nobody who looks at the first line alone may miss that another signed.
+TEST(HeadFacts, HaveASignerWhoWasNotExpectedBesideAnyReason) {
+  Report report = WithSigner();
+  report.verdict = Verdict::kPartlySigned;
+  const Item signer = {
+      ItemKind::kSigner, "signer", "", ItemState::kRefused, {&cause::kSignerUnexpected, "who"}};
+  report.items = {Library(&cause::kLibraryMissing), signer};
+  report.items[0].state = ItemState::kRefused;
+  EXPECT_EQ(HeadFacts(report, "..."),
+            Lines({"lib/arm64/a.so: it does not lie beside the package, where others are",
+                   "its signer is none that --signer names: who"}));
+  report.verdict = Verdict::kNotAccepted;
+  report.items = {signer};
+  EXPECT_EQ(HeadFacts(report, "..."), Lines({"its signer is none that --signer names: who"}));
+  // That the signer of a refused file is not known follows from the refusal.
+  report.verdict = Verdict::kRefused;
+  report.items = {Library(&cause::kLibraryMissing), signer};
+  report.items[0].state = ItemState::kRefused;
+  report.items[1].reason = {&cause::kSignerNotVerified, "who"};
+  EXPECT_EQ(HeadFacts(report, "...").size(), 1U);
+}
+
+TEST(HeadFacts, NameTheOtherSigner) {
+  Report report = WithSigner();
+  report.verdict = Verdict::kOtherSigner;
+  RangeJudgement range;
+  range.is_verified = true;
+  range.signers = {{"v3", *report.signer}};
+  range.signers[0].certificate.subject = "CN=other";
+  range.signers[0].certificate.key.sha256 = "other";
+  report.installer.ranges = {range};
+  EXPECT_EQ(HeadFacts(report, "..."),
+            Lines({"com.app", "signer CN=a, RSA-512", "phones install it for CN=other"}));
 }
 
 TEST(SignerRows, SayOfTheKeyWhatTheKernelGot) {

@@ -439,6 +439,14 @@ TEST(MakeReport, FileThatTheToolDidNotLookAt) {
   EXPECT_EQ(item(0, true, false), "file refused standard-input-closed");
 }
 
+TEST(MakeReport, DirectoryWithoutPackagesWasNotLookedAt) {
+  RunRecord record = Record({});
+  record.has_no_packages = true;
+  const Report report = MakeReport(record, {}, {});
+  EXPECT_EQ(report.verdict, Verdict::kNotLookedAt);
+  EXPECT_EQ(ItemsOf(report), Lines({"file refused no-packages"}));
+}
+
 TEST(MakeReport, ToolThatSaysNothingOfAFileThatItCouldOpenIsNotTheTool) {
   const Report report = Made({});
   EXPECT_EQ(report.verdict, Verdict::kNotSimulated);

@@ -16,10 +16,10 @@ PackageFacts Package() {
   facts.jar.certificate->subject = "CN=a";
   facts.jar.certificate->key.algorithm = "RSA";
   facts.jar.certificate->key.bits = 2048;
-  facts.entries = {{{"classes.dex", 1, false}, true, false},
-                   {{"lib/arm64-v8a/a.so", 10, false}, true, false},
-                   {{"lib/x86/a.so", 100, false}, true, false},
-                   {{"res/a", 1000, false}, true, false},
+  facts.entries = {{{"classes.dex", 1, false}, true, false, EntryDigest::kMatches},
+                   {{"lib/arm64-v8a/a.so", 10, false}, true, false, EntryDigest::kMatches},
+                   {{"lib/x86/a.so", 100, false}, true, false, EntryDigest::kMatches},
+                   {{"res/a", 1000, false}, true, false, EntryDigest::kMatches},
                    {{"added", 10000, false}, false, false},
                    {{"META-INF/CERT.SF", 100000, false}, false, true}};
   return facts;
@@ -76,6 +76,31 @@ TEST(Protection, NothingIsVerifiedThatWasNotCompared) {
   EXPECT_EQ(verified(false, false), 0U);
   EXPECT_EQ(verified(true, false), 1U);
   EXPECT_EQ(verified(false, true), 10U);
+}
+
+// The tool looked at the library beside the package, and the package's own is another one.
+TEST(Protection, EntryThatIsOtherThanListedIsNotVerified) {
+  PackageFacts facts = Package();
+  facts.entries[1].digest = EntryDigest::kDiffers;
+  facts.entries[3].digest = EntryDigest::kDiffers;
+  facts.entries[2].digest = EntryDigest::kNotCompared;
+  facts.missing = {"gone"};
+  const Protection protection =
+      FindProtection(facts, {PackageItem(nullptr, true), LibraryItem(nullptr, true)});
+  EXPECT_EQ(protection.verified.bytes, 1U);
+  EXPECT_EQ(protection.vouched.bytes, 0U);
+  EXPECT_EQ(protection.differing.bytes, 1010U);
+  EXPECT_EQ(protection.differing_seen, 1U);
+  EXPECT_EQ(protection.differing_names, std::vector<std::string>({"lib/arm64-v8a/a.so", "res/a"}));
+  EXPECT_EQ(protection.uncompared.bytes, 100U);
+  EXPECT_EQ(protection.missing_names, std::vector<std::string>({"gone"}));
+}
+
+TEST(Protection, LibraryThatTheToolFoundChangedIsNotVerified) {
+  const Protection protection =
+      FindProtection(Package(), {PackageItem(nullptr, true), LibraryItem(&cause::kLibraryChanged)});
+  EXPECT_EQ(protection.verified.bytes, 1U);
+  EXPECT_EQ(protection.vouched.bytes, 1110U);
 }
 
 TEST(Chain, BreaksWhereTheCauseSays) {

@@ -233,3 +233,105 @@ TEST(Warnings, OfAJarAreNotThoseOfAPackage) {
   facts.manifest.installer_name = "x";
   EXPECT_EQ(Warnings(facts, ReportOf(facts, ItemKind::kJar)), Lines());
 }
+
+// ---- Entries that are not as the manifest lists them.
+
+TEST(Warnings, EntriesThatAreOtherThanListedMissingOrNotCompared) {
+  PackageFacts facts = Good();
+  facts.entries = {{{"same", 1, false}, true, false, EntryDigest::kMatches},
+                   {{"a", 1, false}, true, false, EntryDigest::kDiffers},
+                   {{"b", 1, false}, true, false, EntryDigest::kDiffers},
+                   {{"long", 1, false}, true, false, EntryDigest::kNotCompared}};
+  facts.missing = {"gone"};
+  EXPECT_EQ(Warnings(facts),
+            Lines({"entries-changed: 2 entries: a, ...", "entries-missing: 1 entry: gone",
+                   "entries-not-compared: 1 entry: long"}));
+  EXPECT_EQ(cause::kEntriesNotCompared.severity, Severity::kAlarm);
+}
+
+TEST(Warnings, WhatAnItemSaysIsNotSaidTwice) {
+  PackageFacts facts = Good();
+  facts.entries = {{{"classes.dex", 1, false}, true, false, EntryDigest::kDiffers},
+                   {{"lib/arm64-v8a/a.so", 1, false}, true, false, EntryDigest::kDiffers},
+                   {{"damaged", 1, true}, true, false, EntryDigest::kNotCompared}};
+  Report report = ReportOf(facts);
+  report.items[0].reason.cause = &cause::kDexChanged;
+  report.items.push_back({ItemKind::kLibrary,
+                          "lib/arm64/a.so",
+                          "lib/arm64-v8a/a.so",
+                          ItemState::kRefused,
+                          {&cause::kLibraryChangedInside, ""}});
+  EXPECT_EQ(Warnings(facts, report), Lines({"entries-damaged: 1 entry: damaged"}));
+}
+
+// ---- Keys that nobody should sign a release with.
+
+TEST(Warnings, KeyThatIsTooShort) {
+  PackageFacts facts = Good();
+  facts.jar.key->bits = 2047;
+  EXPECT_EQ(Warnings(facts), Lines({"weak-key: 2047"}));
+  facts.jar.key->bits = 2048;
+  EXPECT_EQ(Warnings(facts), Lines());
+}
+
+TEST(Warnings, DebugCertificate) {
+  PackageFacts facts = Good();
+  facts.jar.certificate->subject = "C=US, O=Android, CN=Android Debug";
+  EXPECT_EQ(Warnings(facts), Lines({"debug-key: "}));
+  facts.jar.certificate->subject = "CN=Android Debug, O=Android";
+  EXPECT_EQ(Warnings(facts), Lines({"debug-key: "}));
+  facts.jar.certificate->subject = "CN=Android Debugger";
+  EXPECT_EQ(Warnings(facts), Lines());
+}
+
+TEST(Warnings, DigestsForWhichCollisionsAreKnown) {
+  PackageFacts facts = Good();
+  facts.jar.certificate->signature_algorithm = "SHA256withRSA";
+  facts.jar.block.digest = "SHA256";
+  facts.entries = {{{"a", 1, false}, true, false, EntryDigest::kMatches, false}};
+  EXPECT_EQ(Warnings(facts), Lines());
+  for (const char* digest : {"SHA384", "SHA512", "SHA224"}) {
+    facts.jar.block.digest = digest;
+    facts.jar.certificate->signature_algorithm = std::string(digest) + "withRSA";
+    EXPECT_EQ(Warnings(facts), Lines()) << digest;
+  }
+  facts.jar.block.digest = "SHA256";
+  facts.jar.certificate->signature_algorithm = "SHA1withRSA";
+  EXPECT_EQ(Warnings(facts), Lines({"weak-digest: the certificate is signed with SHA1withRSA"}));
+  facts.jar.certificate->signature_algorithm = "SHA256withRSA";
+  facts.jar.has_sha1_of_manifest = true;
+  EXPECT_EQ(Warnings(facts),
+            Lines({"weak-digest: the signature file has the manifest's SHA-1 digest"}));
+  facts.jar.has_sha1_of_manifest = false;
+  facts.entries[0].has_sha1 = true;
+  EXPECT_EQ(Warnings(facts), Lines({"weak-digest: the manifest has SHA-1 digests of 1 entry"}));
+  facts.entries[0].has_sha1 = false;
+  facts.jar.block.digest = "MD5";
+  EXPECT_EQ(Warnings(facts), Lines({"weak-digest: the signature block is made with MD5"}));
+  facts.jar.block.digest = "SHA1";
+  facts.jar.certificate->signature_algorithm = "MD5withRSA";
+  EXPECT_EQ(Warnings(facts), Lines({"weak-digest: the certificate is signed with MD5withRSA, the "
+                                    "signature block is made with SHA1"}));
+}
+
+// date -u -d @1000000000: 2001-09-09 01:46:40. The second that a certificate names is its last.
+TEST(Warnings, CertificateThatExpired) {
+  const auto told = [](std::optional<int64_t> end, int64_t now) {
+    PackageFacts facts = Good();
+    facts.jar.certificate->not_after = end;
+    Lines codes;
+    for (const Reason& each : FindWarnings({}, facts, ReportOf(facts), now)) {
+      codes.push_back(std::string(each.cause->code) + ": " + each.detail);
+    }
+    return codes;
+  };
+  EXPECT_EQ(told(1000000000, 1000000001), Lines({"certificate-expired: 2001-09-09 01:46:40 UTC"}));
+  EXPECT_EQ(told(1000000000, 1000000000), Lines());
+  EXPECT_EQ(told({}, 1000000001), Lines());
+}
+
+TEST(Warnings, EncryptedEntriesAreNotCalledDamaged) {
+  PackageFacts facts = Good();
+  facts.entries = {{{"secret", 1, true, true}, true, false, EntryDigest::kNotCompared}};
+  EXPECT_EQ(Warnings(facts), Lines({"entries-encrypted: 1 entry: secret"}));
+}

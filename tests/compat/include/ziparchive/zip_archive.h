@@ -1,9 +1,8 @@
-// The platform zip library as it looks on API level 27: names are ZipString, handles are void*, an
-// absent filter is a null pointer. Found instead of the library's own header in the preset
-// `zipstring`, so that the tool and its tests are built and run against this generation too.
+// The platform zip library as in API level 27: names are ZipString, handles are void*, and a
+// missing filter is a null pointer. The preset `zipstring` finds this header instead of the
+// library's own, so that the tool and its tests are built and run with this generation, too.
 //
-// Only what the two generations differ in is defined here (zipstring_library.cpp), on top of the
-// library that is installed.
+// zipstring_library.cpp defines only the parts that differ, on top of the installed library.
 #pragma once
 
 #include <sys/types.h>
@@ -17,7 +16,7 @@ struct ZipString {
   uint16_t name_length;
 
   ZipString() {}  // leaves both fields as they are, as on the phone
-  // Ends the program when `entry_name` is longer than 65,535 bytes.
+  // Ends the program if `entry_name` is longer than 65,535 bytes.
   explicit ZipString(const char* entry_name);
 
   bool operator==(const ZipString& other) const;
@@ -62,6 +61,6 @@ int32_t ProcessZipEntryContents(ZipArchiveHandle archive, ZipEntry* entry,
 
 int GetFileDescriptor(ZipArchiveHandle archive);
 
-// The same in both generations: the installed library answers.
+// Equal in both generations: the installed library's own functions.
 void EndIteration(void* cookie);
 const char* ErrorCodeString(int32_t error_code);

@@ -1,6 +1,6 @@
 package android.content.pm;
 
-/** As much of the platform's class as SignerDigests uses. */
+/** The part of the platform's class that SignerDigests uses. */
 public final class SigningInfo {
     private final Signature[] signers;
 

@@ -1,0 +1,151 @@
+#include "library/verification.h"
+
+#include <android/log.h>
+
+#include <cerrno>
+#include <cstdarg>
+#include <cstdio>
+#include <cstring>
+#include <string_view>
+#include <utility>
+
+#include "apk/zip_library.h"
+#include "util/log.h"
+
+namespace ApkTools {
+
+namespace {
+
+// How a line that the tool's code logs begins, and what it says of the package. Each refusal logs
+// at most one of these, or the same one twice, after the parser's line: the last one is the reason.
+constexpr struct LoggedReason {
+  const char* start;
+  Reason reason;
+} kLoggedReasons[] = {
+    {"Can't initialize Apk: need valid file descriptor or filename\n", Reason::kNoDescriptor},
+    {"OpenArchiveFd(", Reason::kNoArchive},
+    {"Can't extract Android Manifest: ", Reason::kAndroidManifestUnreadable},
+    {"Parse manifest: ", Reason::kSignatureFileMalformed},
+    {"Can't extract RSA certificate: ", Reason::kNoRsaBlock},
+    {"Unknown certificate type", Reason::kBlockMalformed},
+    {"RSA could not set key: ", Reason::kKeyRefused},
+    {"RSA could not verify certificate: ", Reason::kCertificateRefused},
+    {"RSA could not verify data: ", Reason::kSignatureRefused},
+    {"Can't validate manifest.\n", Reason::kManifestRefused},
+    {"Can't load manifest: ", Reason::kManifestMalformed},
+    {"Can't process Android Manifest.\n", Reason::kAndroidManifestMalformed},
+    {"Integrity not confirmed: classes.dex\n", Reason::kDexRefused},
+};
+
+// Of the verification that this thread is at, or null.
+thread_local Reason* heard = nullptr;
+
+Reason ReasonOf(Apk& apk, Reason logged);
+bool HasEntry(Apk& apk, const std::string& prefix, const std::string& suffix);
+void Hear(std::string_view text);
+
+}  // namespace
+
+Verification::Verification(int fd) {
+  Reason logged = Reason::kUnknown;
+  Reason* const outer = std::exchange(heard, &logged);
+  apk_.emplace(fd);
+  const bool is_good = apk_->IsGoodApk();
+  heard = outer;
+  reason_ = is_good ? Reason::kGood : ReasonOf(*apk_, logged);
+}
+
+Verification::~Verification() { apk_->Release(); }
+
+const char* TextOf(Reason reason) {
+  switch (reason) {
+    case Reason::kGood:
+      return "it is good";
+    case Reason::kNoDescriptor:
+      return "there is no file";
+    case Reason::kNoArchive:
+      return "it is no zip archive, or a damaged one";
+    case Reason::kNoPackage:
+      return "it is no package: it has no AndroidManifest.xml";
+    case Reason::kAndroidManifestUnreadable:
+      return "AndroidManifest.xml cannot be extracted";
+    case Reason::kUnsigned:
+      return "it has no JAR signature";
+    case Reason::kSignatureUnreadable:
+      return "its manifest or signature file cannot be extracted";
+    case Reason::kSignatureFileMalformed:
+      return "its signature file is malformed";
+    case Reason::kNoRsaBlock:
+      return "there is no RSA block for its signature file";
+    case Reason::kBlockMalformed:
+      return "its signature block is malformed, or not of an RSA key";
+    case Reason::kKeyRefused:
+      return "its key cannot be used";
+    case Reason::kCertificateRefused:
+      return "its certificate is not signed with its own key";
+    case Reason::kSignatureRefused:
+      return "its signature file is not what was signed";
+    case Reason::kManifestRefused:
+      return "its manifest is not what was signed";
+    case Reason::kManifestMalformed:
+      return "its manifest is malformed";
+    case Reason::kAndroidManifestMalformed:
+      return "its AndroidManifest.xml is no compiled XML";
+    case Reason::kDexRefused:
+      return "classes.dex is not what its manifest lists";
+    case Reason::kUnknown:
+      break;
+  }
+  return "for a reason that only the log tells";
+}
+
+namespace {
+
+// Two kinds are told apart by what is in the archive: the manifest that is missing, of which one
+// line is logged as of one that cannot be extracted, and the signature's files, of which none is.
+Reason ReasonOf(Apk& apk, Reason logged) {
+  if (logged == Reason::kAndroidManifestUnreadable) {
+    return HasEntry(apk, "AndroidManifest.xml", "") ? logged : Reason::kNoPackage;
+  }
+  if (logged != Reason::kUnknown || !apk.IsApk()) return logged;
+  const bool is_signed = HasEntry(apk, Apk::kMANIFEST_MF, "") && HasEntry(apk, "META-INF/", ".SF");
+  return is_signed ? Reason::kSignatureUnreadable : Reason::kUnsigned;
+}
+
+// Whether there is an entry of the name `prefix` or, if `suffix` is not empty, of a name that
+// begins and ends so.
+bool HasEntry(Apk& apk, const std::string& prefix, const std::string& suffix) {
+  void* cookie;
+  if (apk.StartIteration(&cookie, prefix, suffix) != 0) return false;
+  ZipEntry entry;
+  std::string name;
+  bool has = false;
+  while (!has && apk.Next(cookie, &entry, name) == 0) has = !suffix.empty() || name == prefix;
+  apk.EndIteration(cookie);
+  return has;
+}
+
+void Hear(std::string_view text) {
+  if (heard == nullptr) return;
+  for (const auto& [start, reason] : kLoggedReasons) {
+    if (text.compare(0, strlen(start), start) == 0) *heard = reason;
+  }
+}
+
+}  // namespace
+
+}  // namespace ApkTools
+
+// The program's definition comes before the platform's, for the platform's libraries as well. What
+// is longer than a record of the log is cut, as the log would cut it.
+extern "C" int __android_log_print(int priority, const char* tag, const char* format, ...) {
+  const int saved_errno = errno;
+  char text[kLogTextSize];
+  va_list arguments;
+  va_start(arguments, format);
+  vsnprintf(text, sizeof(text), format, arguments);
+  va_end(arguments);
+  if (tag != nullptr && strcmp(tag, kLogTag) == 0) ApkTools::Hear(text);
+  errno = saved_errno;
+  return __android_log_write(priority, tag, text);
+}

@@ -1,0 +1,62 @@
+// What the platform's own verifier says of a package: whether the installer of a phone takes it.
+// Its answers are texts of another program about a hostile file, so each is read with care, and
+// what does not read counts as no answer.
+#pragma once
+
+#include <climits>
+#include <string>
+#include <vector>
+
+#include "simulator/package/certificate.h"
+
+namespace simulator {
+
+// Phones, by the API levels of their platforms.
+struct LevelRange {
+  int first;
+  int last;
+};
+
+// The last level of a range that has no end.
+inline constexpr int kNewestLevel = INT_MAX;
+
+// An error or a warning, as apksig has it.
+struct InstallerIssue {
+  std::string name;  // such as "JAR_SIG_ZIP_ENTRY_NOT_SIGNED"
+  std::vector<std::string> parameters;
+  std::string text;  // apksig's own sentence
+};
+
+// A signer of one scheme that verified.
+struct InstallerSigner {
+  std::string scheme;  // "v1", "v2", "v3" or "v3.1"
+  CertificateFacts certificate;
+};
+
+// The judgement of the phones of some levels.
+struct RangeJudgement {
+  LevelRange levels = {0, 0};
+  bool is_verified = false;
+  std::vector<std::string> schemes;      // that were verified, the oldest first
+  std::vector<InstallerSigner> signers;  // of these, in the same order
+  std::vector<InstallerIssue> errors;
+  std::vector<InstallerIssue> warnings;
+};
+
+struct Judgement {
+  enum class State {
+    kNotAsked,  // nobody wanted to know, or the file is no package
+    kMissing,   // the verifier is not installed
+    kGaveUp,    // the verifier did not survive the file, or had no answer
+    kJudged,
+  };
+
+  State state = State::kNotAsked;
+  std::string why;                     // of kMissing and kGaveUp
+  std::vector<RangeJudgement> ranges;  // by their levels; of neighbours not the same is said
+};
+
+// The answer in one line of the verifier: kJudged or kGaveUp.
+Judgement ParseJudgement(const std::string& line);
+
+}  // namespace simulator

@@ -1,0 +1,47 @@
+// What the manifest says of each entry of a package, and whether it is so. Which digest is listed
+// for which name, and whether it is the entry's, is asked of the tool's own code. The tool itself
+// looks at few of them.
+#pragma once
+
+#include <cstdint>
+#include <functional>
+#include <string>
+#include <vector>
+
+#include "simulator/package/archive.h"
+
+namespace simulator {
+
+// What the tool's code makes of an entry and its digest in the manifest.
+enum class EntryDigest {
+  kUnlisted,  // there is none
+  kMatches,
+  kDiffers,
+  kNotCompared,  // the entry cannot be read or is too long, its digest is of no kind that the tool
+                 // reads, or the time was up
+};
+
+struct ListedEntry {
+  ArchiveEntry entry;
+  bool is_listed;     // the manifest has a digest for it
+  bool is_signature;  // it belongs to a JAR signature itself
+  EntryDigest digest = EntryDigest::kUnlisted;
+  bool has_sha1 = false;  // the digest by which the tool would know it is a SHA-1 digest
+};
+
+struct PackageEntries {
+  std::vector<ListedEntry> all;      // in the order of the archive
+  std::vector<std::string> missing;  // names that the manifest lists and the archive does not have
+};
+
+// True when no more time is to be spent.
+using IsLate = std::function<bool()>;
+
+// `manifest`: the text of META-INF/MANIFEST.MF; may be empty.
+PackageEntries CompareEntries(Archive* archive, std::vector<uint8_t> manifest,
+                              const IsLate& is_late);
+
+// Whether the tool takes a digest of this name, such as "SHA1-Digest", for one of SHA-1.
+bool IsSha1Digest(const std::string& name);
+
+}  // namespace simulator

@@ -1,0 +1,42 @@
+// The report of a run for what reads test results: one JUnit document, a test case for each file. A
+// refusal is a failure, and a file that was not judged is an error: no case is ever skipped.
+// Whatever comes from a file is text in it.
+#pragma once
+
+#include <string>
+#include <string_view>
+#include <vector>
+
+#include "simulator/verdict/report.h"
+
+namespace simulator {
+
+// What each document begins with.
+inline constexpr std::string_view kJunitStart =
+    "<?xml version=\"1.0\" encoding=\"UTF-8\"?>\n<!-- A JUnit report of apktoolkit-sim -->\n";
+
+class Junit {
+ public:
+  // The next file, in the order of the command line.
+  void Add(const Report& report);
+
+  // The whole document, in UTF-8.
+  std::string Xml() const;
+
+ private:
+  enum class Outcome { kPassed, kFailure, kError };
+
+  struct Case {
+    std::string name;
+    Outcome outcome;
+    std::string type;     // the code of why it did not pass
+    std::string message;  // the same in words
+    std::string text;     // what was refused, or what is doubtful, and what to do
+  };
+
+  size_t Count(Outcome outcome) const;
+
+  std::vector<Case> cases_;
+};
+
+}  // namespace simulator

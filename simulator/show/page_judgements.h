@@ -1,0 +1,13 @@
+// The page's table of who says what of a file: the tool, and the phones' installer.
+#pragma once
+
+#include <kainjow/mustache.hpp>
+
+#include "simulator/verdict/report.h"
+
+namespace simulator {
+
+// Sets the sections of the table. It is empty for what is no package.
+void AddJudgements(const Report& report, kainjow::mustache::data* file);
+
+}  // namespace simulator

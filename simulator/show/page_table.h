@@ -1,0 +1,42 @@
+// The page's table of files: the worst first, with a choice of what is shown. The directory that
+// all of them lie in is told once.
+#pragma once
+
+#include <kainjow/mustache.hpp>
+#include <string>
+#include <vector>
+
+#include "simulator/verdict/report.h"
+
+namespace simulator {
+
+class PageTable {
+ public:
+  // The next file, in the order of the command line.
+  void Add(const Report& report);
+
+  // Sets the sections of the table: the directory, the choices and the rows.
+  void Fill(kainjow::mustache::data* page) const;
+
+ private:
+  struct Row {
+    size_t number;  // of the file, from 1
+    std::string file;
+    Verdict verdict;
+    std::string reason;
+    size_t warnings;
+    std::string package_name;
+    std::string signer;
+  };
+
+  kainjow::mustache::list Choices() const;
+  std::vector<const Row*> WorstFirst() const;
+
+  std::vector<Row> rows_;
+};
+
+// The directory that all of these lie in by their names, with its "/" at the end; empty if there is
+// none, or none but "/".
+std::string CommonDirectory(const std::vector<std::string>& files);
+
+}  // namespace simulator

@@ -1,0 +1,56 @@
+// The report of a run for what reads the results of static analysis: one SARIF log (OASIS Static
+// Analysis Results Interchange Format, version 2.1.0). Each thing that was refused is a result of
+// level "error", each warning one of level "warning"; the rules are the causes. A file that was not
+// judged is an error, and the run that it belongs to was not successful. Whatever comes from a file
+// is text in it.
+#pragma once
+
+#include <map>
+#include <nlohmann/json.hpp>
+#include <string>
+#include <string_view>
+
+#include "simulator/verdict/report.h"
+
+namespace simulator {
+
+// What each log begins with.
+inline constexpr std::string_view kSarifStart =
+    "{\n"
+    "  \"$schema\": \"https://docs.oasis-open.org/sarif/sarif/v2.1.0/errata01/os/schemas/"
+    "sarif-schema-2.1.0.json\",\n"
+    "  \"version\": \"2.1.0\",\n"
+    "  \"runs\": [\n"
+    "    {\n"
+    "      \"tool\": {\n"
+    "        \"driver\": {\n"
+    "          \"name\": \"apktoolkit-sim\",\n";
+
+class Sarif {
+ public:
+  // The next file, in the order of the command line.
+  void Add(const Report& report);
+
+  // The whole log, in UTF-8.
+  std::string Log() const;
+
+ private:
+  using Json = nlohmann::ordered_json;
+
+  size_t AddArtifact(const Report& report);
+  void AddResult(const Cause& cause, const char* level, const std::string& text,
+                 const Json& location);
+  size_t RuleOf(const Cause& cause, const char* level);
+
+  std::map<std::string, size_t> rule_of_;      // by the cause's code
+  std::map<std::string, size_t> artifact_of_;  // by its text
+  Json rules_ = Json::array();
+  Json artifacts_ = Json::array();
+  Json results_ = Json::array();
+  Json notifications_ = Json::array();
+};
+
+// The file as an URI reference (RFC 3986 §4.1): of an absolute path the whole URI.
+std::string UriOf(std::string_view path);
+
+}  // namespace simulator

@@ -1,0 +1,114 @@
+// What the phones' installer makes of a package, beside what the tool made of it.
+#include <algorithm>
+
+#include "simulator/verdict/parts.h"
+#include "simulator/verdict/wording.h"
+
+namespace simulator {
+
+namespace {
+
+std::string LevelsText(const std::vector<RangeJudgement>& ranges, bool is_verified);
+std::string WhyRefusedByInstaller(const InstallerIssue& issue);
+
+}  // namespace
+
+void AddInstallerItem(const Judgement& judgement, const JudgeOptions& options,
+                      std::vector<Item>* items) {
+  const auto add = [&](const Reason& reason) {
+    items->push_back(NotDone(ItemKind::kInstaller, "installer", reason, options));
+  };
+  if (judgement.state == Judgement::State::kGaveUp) add({&cause::kInstallerGaveUp, judgement.why});
+  const auto is_refused = [](const RangeJudgement& range) { return !range.is_verified; };
+  const auto refused = std::find_if(judgement.ranges.begin(), judgement.ranges.end(), is_refused);
+  if (refused == judgement.ranges.end()) return;
+  const std::string why = WhyRefusedByInstaller(refused->errors[0]);
+  const std::string takers = LevelsText(judgement.ranges, true);
+  if (takers.empty()) return add({&cause::kNotInstallable, why});
+  add({&cause::kNotInstallableOnSome, LevelsText(judgement.ranges, false) +
+                                          " refuse it, those of " + takers + " take it: " + why});
+}
+
+std::string LevelText(const LevelRange& levels) {
+  const std::string first = "API " + std::to_string(levels.first);
+  if (levels.last == kNewestLevel) return first + " and later";
+  return levels.first == levels.last ? first : first + " to " + std::to_string(levels.last);
+}
+
+std::string TakersText(const Judgement& judgement) {
+  // Where all take it, one answer is for all of them.
+  if (judgement.ranges.size() != 1 || !judgement.ranges[0].is_verified) return {};
+  return "phones of " + LevelText(judgement.ranges[0].levels) + " take it, by " +
+         Joined(judgement.ranges[0].schemes);
+}
+
+// Phones go by the newest scheme that they know, and by all of its signers.
+const CertificateFacts* OtherSigner(const Judgement& judgement, const Report& report) {
+  const CertificateFacts* other = nullptr;
+  for (const RangeJudgement& range : judgement.ranges) {
+    if (!range.is_verified) continue;
+    other = nullptr;
+    for (const InstallerSigner& signer : range.signers) {
+      const bool is_newest = signer.scheme == range.signers.back().scheme;
+      if (is_newest && !IsJarSigner(signer.certificate.key, report)) other = &signer.certificate;
+    }
+  }
+  return other;
+}
+
+namespace {
+
+// The levels of the phones that take the package, or of those that do not: "API 27 to 29".
+std::string LevelsText(const std::vector<RangeJudgement>& ranges, bool is_verified) {
+  std::vector<LevelRange> levels;
+  for (const RangeJudgement& range : ranges) {
+    if (range.is_verified != is_verified) continue;
+    const bool follows = !levels.empty() && levels.back().last + 1 == range.levels.first;
+    if (follows) {
+      levels.back().last = range.levels.last;
+    } else {
+      levels.push_back(range.levels);
+    }
+  }
+  std::vector<std::string> texts;
+  for (const LevelRange& each : levels) texts.push_back(LevelText(each));
+  return Joined(texts);
+}
+
+// The faults that packages have most often, in words that name the entry; "%s" is the parameter of
+// that number. Of all others apksig's own sentence is told.
+constexpr struct {
+  const char* issue;
+  size_t parameter;
+  const char* words;
+} kFaults[] = {
+    {"JAR_SIG_ZIP_ENTRY_DIGEST_DID_NOT_VERIFY", 0, "%s was changed after it was signed"},
+    {"JAR_SIG_MISSING_ZIP_ENTRY_REFERENCED_IN_MANIFEST", 0,
+     "%s was removed after it was signed: the manifest still lists it"},
+    {"JAR_SIG_NO_ZIP_ENTRY_DIGEST_IN_MANIFEST", 0,
+     "%s was added after signing: the manifest does not list it"},
+    {"JAR_SIG_ZIP_ENTRY_NOT_SIGNED", 0, "%s is not signed"},
+    {"JAR_SIG_DUPLICATE_ZIP_ENTRY", 0, "%s stands in it more than once"},
+    {"JAR_SIG_MISSING_APK_SIG_REFERENCED", 2,
+     "it was signed with %s as well, and that signature is gone"},
+    {"MIN_SIG_SCHEME_FOR_TARGET_SDK_NOT_MET", 0,
+     "an app that targets API %s must be signed with v2 or later"},
+    {"V2_SIG_APK_DIGEST_DID_NOT_VERIFY", SIZE_MAX, "it was changed after it was signed with v2"},
+    {"V3_SIG_APK_DIGEST_DID_NOT_VERIFY", SIZE_MAX, "it was changed after it was signed with v3"},
+};
+
+std::string WhyRefusedByInstaller(const InstallerIssue& issue) {
+  for (const auto& fault : kFaults) {
+    if (issue.name != fault.issue) continue;
+    std::string words = fault.words;
+    const size_t at = words.find("%s");
+    if (at == std::string::npos) return words;
+    if (fault.parameter >= issue.parameters.size()) break;
+    return words.replace(at, 2, issue.parameters[fault.parameter]);
+  }
+  return issue.text + " (" + issue.name + ")";
+}
+
+}  // namespace
+
+}  // namespace simulator

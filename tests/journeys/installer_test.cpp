@@ -1,0 +1,232 @@
+// What the phones' installer makes of a package, beside what the tool made of it: real packages,
+// and the lines that a person is told of them.
+#include <gtest/gtest.h>
+
+#include <nlohmann/json.hpp>
+#include <sstream>
+
+#include "support/files.h"
+#include "support/process.h"
+#include "support/simulation.h"
+
+namespace {
+
+using Lines = std::vector<std::string>;
+using nlohmann::json;
+
+std::string Golden(const std::string& name) { return std::string(GOLDEN_PACKAGES) + "/" + name; }
+
+ProcessResult Run(const std::string& name, Lines options) {
+  options.insert(options.begin(), {"env", "LC_ALL=C.UTF-8", SimulatorPath()});
+  options.emplace_back("base.apk");
+  return RunProcess(options, Golden(name));
+}
+
+// The word of the verdict, the installer's line, and the status.
+Lines Told(const std::string& name, const Lines& options = {}) {
+  const ProcessResult run = Run(name, options);
+  EXPECT_EQ(run.errors, "");
+  Lines told;
+  std::istringstream text(run.output);
+  for (std::string line; std::getline(text, line);) {
+    if (told.empty()) told.push_back(line.substr(0, line.find("  ")));
+    for (const std::string start : {"  ✗ installer", "    installer:"}) {
+      if (line.rfind(start, 0) != 0) continue;
+      told.push_back(line.substr(line.find_first_not_of(' ', start.size())));
+    }
+  }
+  told.push_back("-> " + std::to_string(run.status));
+  return told;
+}
+
+json VerdictOf(const std::string& name, Lines options = {}) {
+  options.emplace_back("--json");
+  std::istringstream lines(Run(name, options).output);
+  json event;
+  for (std::string line; std::getline(lines, line);) event = json::parse(line);
+  return event;
+}
+
+}  // namespace
+
+TEST(Installer, TakesWhatApksignerSigned) {
+  EXPECT_EQ(Told("apksigner-sha256-2048"),
+            Lines({"SIGNED", "phones of API 27 and later take it, by v2, v3", "-> 0"}));
+  EXPECT_EQ(Told("v1-alone"),
+            Lines({"SIGNED", "phones of API 27 and later take it, by v1", "-> 0"}));
+}
+
+// The tool does not look at AndroidManifest.xml, so that anybody can put another app's signature
+// around his own.
+TEST(Installer, RefusesAForeignManifestUnderTheVictimsSignature) {
+  EXPECT_EQ(Told("foreign-manifest"),
+            Lines({"NOT INSTALLABLE",
+                   "phones do not install it: AndroidManifest.xml was changed after it was signed",
+                   "-> 1"}));
+  EXPECT_EQ(Told("foreign-manifest", {"--installer=off"}), Lines({"SIGNED", "-> 0"}));
+}
+
+TEST(Installer, RefusesAPackageWithoutItsDex) {
+  EXPECT_EQ(Told("without-dex"), Lines({"NOT INSTALLABLE",
+                                        "phones do not install it: classes.dex was removed after "
+                                        "it was signed: the manifest still lists it",
+                                        "-> 1"}));
+}
+
+// The tool looks at the library that lies beside the package.
+TEST(Installer, RefusesALibraryChangedInsideThePackage) {
+  EXPECT_EQ(Told("changed-inside"),
+            Lines({"NOT INSTALLABLE",
+                   "phones do not install it: lib/arm64-v8a/libvault.so was changed after it was "
+                   "signed",
+                   "-> 1"}));
+}
+
+TEST(Entries, AreComparedByTheToolsOwnCodeWhereNobodyAsksAnInstaller) {
+  const json event = VerdictOf("foreign-manifest", {"--installer=off"});
+  EXPECT_EQ(event["verdict"], "signed");
+  EXPECT_EQ(event["entries"]["differing"]["names"], json({"AndroidManifest.xml"}));
+  EXPECT_EQ(event["entries"]["differing"]["looked_at"], 0);
+  EXPECT_EQ(event["entries"]["matching"]["entries"], 3);
+  EXPECT_EQ(event["entries"]["matching"]["looked_at"], 3);
+  ASSERT_EQ(event["warnings"].size(), 1U);
+  EXPECT_EQ(event["warnings"][0]["reason"], "entries-changed");
+  const json without = VerdictOf("without-dex", {"--installer=off"});
+  EXPECT_EQ(without["entries"]["missing"]["names"], json({"classes.dex"}));
+  ASSERT_EQ(without["warnings"].size(), 1U);
+  EXPECT_EQ(without["warnings"][0]["reason"], "entries-missing");
+}
+
+// The library beside the package came from it a moment ago: nobody changed it there.
+TEST(Entries, LibraryChangedInsideThePackageIsNotBlamedOnTheInstallation) {
+  const json event = VerdictOf("changed-inside", {"--installer=off", "--install"});
+  EXPECT_EQ(event["verdict"], "partly-signed");
+  EXPECT_EQ(event["items"][1]["reason"], "library-changed-inside");
+  EXPECT_EQ(event["items"][1]["text"],
+            "the package's own copy of it is not what its manifest lists");
+  EXPECT_EQ(event["warnings"], json::array());
+  EXPECT_EQ(event["entries"]["differing"]["looked_at"], 1);
+}
+
+// A fault of the package, and not one that the verifier does not survive. The length of an entry is
+// in its local header, and in the record of the central directory.
+TEST(Installer, RefusesAnEntryThatIsLongerThanItSays) {
+  const TempDir folder;
+  const ProcessResult made = RunProcess({"bash", "-e", "-c", R"(cp -r "$0"/* .
+python3 -c '
+import struct, zipfile
+name = "META-INF/CERT.SF"
+at = zipfile.ZipFile("base.apk").getinfo(name).header_offset
+data = bytearray(open("base.apk", "rb").read())
+for field in (at + 22, data.rindex(name.encode()) - 46 + 24):
+    struct.pack_into("<I", data, field, 10)
+open("base.apk", "wb").write(data)')",
+                                         Golden("v1-alone")},
+                                        folder.path());
+  ASSERT_EQ(made.status, 0) << made.errors;
+  const ProcessResult run = RunProcess({SimulatorPath(), "base.apk"}, folder.path());
+  EXPECT_EQ(run.status, 1);
+  EXPECT_NE(run.output.find("phones do not install it: Failed to read data of compressed entry "
+                            "META-INF/CERT.SF (MALFORMED_APK)\n"),
+            std::string::npos)
+      << run.output << run.errors;
+}
+
+// Phones of API 27 go by v2, newer ones by v3.
+TEST(Installer, RefusesWhatWasChangedUnderANewerSignature) {
+  for (const char* name : {"commented", "changed-inside-v2"}) {
+    EXPECT_EQ(
+        Told(name),
+        Lines({"NOT INSTALLABLE",
+               "phones do not install it: it was changed after it was signed with v2", "-> 1"}))
+        << name;
+  }
+}
+
+TEST(Installer, SaysWhichPhonesRefuse) {
+  EXPECT_EQ(Told("target-30-v1-alone"),
+            Lines({"NOT INSTALLABLE",
+                   "phones of API 30 and later refuse it, those of API 27 to 29 take it: an app "
+                   "that targets API 30 must be signed with v2 or later",
+                   "-> 1"}));
+  EXPECT_EQ(Told("target-30-v1-alone", {"--api", "27-29"}),
+            Lines({"SIGNED", "phones of API 27 to 29 take it, by v1", "-> 0"}));
+  EXPECT_EQ(Told("target-30-v1-alone", {"--api", "29"}),
+            Lines({"SIGNED", "phones of API 29 take it, by v1", "-> 0"}));
+}
+
+TEST(Installer, RefusesAPackageForNewerPhonesThanThoseAskedAbout) {
+  EXPECT_EQ(
+      Told("apksigner-sha256-2048", {"--api", "16-17"}),
+      Lines({"NOT INSTALLABLE",
+             "phones do not install it: the app needs API 18 or later (MIN_SDK_VERSION)", "-> 1"}));
+}
+
+TEST(Installer, AnotherSignerIsSaidInTheVerdict) {
+  EXPECT_EQ(Told("rotated-key"), Lines({"SIGNED, OTHER SIGNER",
+                                        "phones of API 27 and later take it, by v2, v3", "-> 0"}));
+  EXPECT_EQ(Told("two-signers"),
+            Lines({"SIGNED, OTHER SIGNER", "phones of API 27 and later take it, by v2", "-> 0"}));
+  // Phones before API 28 know v2 alone, which the first key made.
+  EXPECT_EQ(Told("rotated-key", {"--api", "27"}),
+            Lines({"SIGNED", "phones of API 27 take it, by v2", "-> 0"}));
+}
+
+TEST(Installer, RefusalOfTheToolStays) {
+  EXPECT_EQ(Told("apksigner-ec"),
+            Lines({"REFUSED", "phones of API 27 and later take it, by v2, v3", "-> 1"}));
+  EXPECT_EQ(Told("changed-dex")[0], "REFUSED");
+}
+
+TEST(Installer, JournalHasTheWholeAnswer) {
+  const json taken = VerdictOf("apksigner-sha256-2048");
+  EXPECT_EQ(taken["verdict"], "signed");
+  EXPECT_EQ(taken["installer"]["state"], "judged");
+  ASSERT_EQ(taken["installer"]["levels"].size(), 1U);
+  const json& levels = taken["installer"]["levels"][0];
+  EXPECT_EQ(levels["first"], 27);
+  EXPECT_FALSE(levels.contains("last"));
+  EXPECT_EQ(levels["installs"], true);
+  ASSERT_EQ(levels["signers"].size(), 2U);
+  EXPECT_EQ(levels["signers"][0]["scheme"], "v2");
+  EXPECT_EQ(levels["signers"][1]["scheme"], "v3");
+  EXPECT_EQ(levels["signers"][1]["certificate_sha256"], taken["signers"][0]["certificate_sha256"]);
+
+  const json refused = VerdictOf("foreign-manifest");
+  EXPECT_EQ(refused["verdict"], "not-installable");
+  EXPECT_EQ(refused["items"].back()["kind"], "installer");
+  EXPECT_EQ(refused["items"].back()["reason"], "not-installable");
+  const json& error = refused["installer"]["levels"][0]["errors"][0];
+  EXPECT_EQ(error["issue"], "JAR_SIG_ZIP_ENTRY_DIGEST_DID_NOT_VERIFY");
+  EXPECT_EQ(error["parameters"][0], "AndroidManifest.xml");
+}
+
+// An answer is one line of JSON, be the names of the entries as they may.
+TEST(Installer, OddNamesDoNotBreakTheAnswer) {
+  const TempDir folder;
+  const ProcessResult made = RunProcess({"python3", "-c", R"(
+import shutil, sys, zipfile
+shutil.copy(sys.argv[1], "base.apk")
+with zipfile.ZipFile("base.apk", "a") as archive:
+    for name in ('a"b\\c', "line\nend", "\u202e", "gr\u00fcn", "\U0001f600"):
+        archive.writestr(name, "x"))",
+                                         Golden("v1-alone") + "/base.apk"},
+                                        folder.path());
+  ASSERT_EQ(made.status, 0) << made.errors;
+  const ProcessResult run = RunProcess({SimulatorPath(), "--quiet", "base.apk"}, folder.path());
+  EXPECT_EQ(run.output.substr(0, 17), "NOT INSTALLABLE  ") << run.output << run.errors;
+}
+
+// There is no java either, and nobody misses it.
+TEST(Installer, IsNotAskedAboutAJar) {
+  const TempDir folder;
+  const ProcessResult made = RunProcess(
+      {"python3", "-c", "import zipfile; zipfile.ZipFile('a.jar', 'w').writestr('a', 'a')"},
+      folder.path());
+  ASSERT_EQ(made.status, 0) << made.errors;
+  const ProcessResult run =
+      RunProcess({"env", "PATH=/nowhere", SimulatorPath(), "--json", "a.jar"}, folder.path());
+  EXPECT_NE(run.output.find(R"("installer":{"state":"not-asked","levels":[]})"), std::string::npos)
+      << run.output;
+  EXPECT_EQ(run.errors, "");
+}

@@ -1,0 +1,160 @@
+// Directories and lists of files, as a pipeline hands them over: what is run, told and counted.
+#include <gtest/gtest.h>
+
+#include <filesystem>
+#include <nlohmann/json.hpp>
+
+#include "support/files.h"
+#include "support/namespaces.h"
+#include "support/process.h"
+#include "support/simulation.h"
+
+namespace {
+
+namespace fs = std::filesystem;
+using Lines = std::vector<std::string>;
+
+// A shop of two good packages, and one that nobody signed.
+class ManyFiles : public testing::Test {
+ protected:
+  ManyFiles() {
+    const fs::path golden = GOLDEN_PACKAGES;
+    for (const char* place : {"good", "shop", "shop/more"}) {
+      fs::create_directories(folder_ / place);
+      fs::copy(golden / "apksigner-sha256-2048/base.apk", folder_ / place);
+    }
+    fs::copy(golden / "unsigned.apk", folder_ / "shop");
+    folder_.Write("shop/notes.txt", ToBytes("notes"));
+  }
+
+  // What the shell makes of it; "sim" is the simulator.
+  ProcessResult Do(const std::string& script, const Lines& before = {}) const {
+    Lines command = before;
+    command.insert(
+        command.end(),
+        {"env", "LC_ALL=C.UTF-8", "bash", "-c",
+         "sim() { \"$SIM\" --installer=off --quiet \"$@\"; }\nSIM=$0\n" + script, SimulatorPath()});
+    return RunProcess(command, folder_.path());
+  }
+
+  // The verdicts without the signer, and the status; then what stands on standard error.
+  static Lines Told(const ProcessResult& run) {
+    Lines lines;
+    std::istringstream text(run.output);
+    for (std::string line; std::getline(text, line);) {
+      lines.push_back(line.substr(0, line.find("   ")));
+    }
+    lines.push_back("-> " + std::to_string(run.status));
+    if (!run.errors.empty()) lines.push_back(run.errors);
+    return lines;
+  }
+
+  const TempDir folder_;
+};
+
+constexpr char kOthers[] =
+    "apktoolkit-sim: 1 file below the directories left out, by their names: not a package's\n";
+
+}  // namespace
+
+TEST_F(ManyFiles, RecursiveLooksAtThePackagesOfADirectory) {
+  EXPECT_EQ(Told(Do("sim --recursive shop")),
+            Lines({"SIGNED  shop/base.apk", "SIGNED  shop/more/base.apk",
+                   "REFUSED  shop/unsigned.apk", "-> 1", kOthers}));
+  EXPECT_EQ(Told(Do("sim --recursive good")), Lines({"SIGNED  good/base.apk", "-> 0"}));
+}
+
+TEST_F(ManyFiles, DirectoryWithoutRecursiveIsRefusedWithTheCure) {
+  const ProcessResult run = RunProcess(
+      {"env", "LC_ALL=C.UTF-8", SimulatorPath(), "--installer=off", "shop", "."}, folder_.path());
+  EXPECT_EQ(run.status, 1);
+  EXPECT_NE(run.output.find("  ✗ file  not signed: it is a directory with 2 packages in it\n"
+                            "      Name them all, a base and its splits: DIRECTORY/*.apk; or give\n"
+                            "      --recursive.\n"),
+            std::string::npos)
+      << run.output;
+  EXPECT_NE(run.output.find("  ✗ file  not signed: it is a directory\n"
+                            "      Name the package inside it, or give --recursive.\n"),
+            std::string::npos);
+}
+
+// Nothing was looked at there, and that is no success.
+TEST_F(ManyFiles, DirectoryWithoutPackagesIsNoSuccess) {
+  fs::create_directory(folder_ / "empty");
+  EXPECT_EQ(Told(Do("sim --recursive good empty --journal journal")),
+            Lines({"SIGNED  good/base.apk", "NOT LOOKED AT  empty", "-> 4"}));
+  const std::string journal = ContentOf(folder_ / "journal");
+  const size_t last = journal.rfind("{\"event\":\"verdict\"");
+  const nlohmann::json verdict = nlohmann::json::parse(journal.substr(last));
+  EXPECT_EQ(verdict["file"], "empty");
+  EXPECT_EQ(verdict["status"], 4);
+  EXPECT_EQ(verdict["items"][0]["reason"], "no-packages");
+}
+
+TEST_F(ManyFiles, DirectoryThatMayNotBeReadIsNoSuccess) {
+  if (!CanMakeNamespaces()) GTEST_SKIP() << kNoNamespaces;
+  fs::create_directory(folder_ / "good/locked");
+  fs::permissions(folder_ / "good/locked", fs::perms::none);
+  EXPECT_EQ(Told(Do("sim --recursive good", {"unshare", "-U"})),
+            Lines({"SIGNED  good/base.apk", "NOT LOOKED AT  good/locked", "-> 4"}));
+}
+
+TEST_F(ManyFiles, NamesComeFromAList) {
+  EXPECT_EQ(Told(Do("printf '%s\\n' good/base.apk shop/unsigned.apk >list; sim --files-from list")),
+            Lines({"SIGNED  good/base.apk", "REFUSED  shop/unsigned.apk", "-> 1"}));
+  EXPECT_EQ(Told(Do("cp good/base.apk $'two\\nlines.apk';"
+                    "find . -name '*lines.apk' -print0 | sim --files-from - -0")),
+            Lines({"SIGNED  ./two\\x0alines.apk", "-> 0"}));
+  EXPECT_EQ(Told(Do("echo good | sim --recursive --files-from=- --null shop/unsigned.apk")),
+            Lines({"REFUSED  shop/unsigned.apk", "NOT LOOKED AT  good\\x0a", "-> 4"}));
+}
+
+TEST_F(ManyFiles, ListThatNamesNothingIsNoSuccess) {
+  EXPECT_EQ(Told(Do("sim good/base.apk --files-from - </dev/null")),
+            Lines({"-> 2", "apktoolkit-sim: the list on standard input names no file\n"}));
+  EXPECT_EQ(Told(Do("sim --files-from none")),
+            Lines({"-> 2",
+                   "apktoolkit-sim: cannot read the list none: No such file or "
+                   "directory\n"}));
+}
+
+// The directory in which a package is laid out is called otherwise each time, and nobody sees it.
+TEST_F(ManyFiles, TwoRunsOverTheSameFileTellTheSame) {
+  const std::string both =
+      "for run in 1 2; do sim --journal $run.journal --html $run.html good/base.apk; "
+      "\"$SIM\" --installer=off --verbose good/base.apk >$run.text; "
+      "sed -i 's/\"pid\":[1-9][0-9]*/\"pid\":N/' $run.journal; done\n";
+  const ProcessResult run =
+      Do(both + "cmp 1.journal 2.journal && cmp 1.html 2.html && cmp 1.text 2.text");
+  EXPECT_EQ(run.status, 0) << run.output << run.errors;
+  const std::string journal = ContentOf(folder_ / "1.journal");
+  EXPECT_NE(journal.find("{\"event\":\"start\",\"file\":\"good/base.apk\",\"path\":\"" +
+                         folder_.path() + "/good/base.apk\",\"installed\":\"<install>/base.apk\"}"),
+            std::string::npos)
+      << journal;
+  EXPECT_NE(journal.find("\"path\":\"<install>/lib/arm64/libvault.so\""), std::string::npos);
+  for (const char* file : {"1.journal", "1.html", "1.text"}) {
+    const std::string content = ContentOf(folder_ / file);
+    EXPECT_EQ(content.find("apktoolkit-sim."), std::string::npos) << file;
+    EXPECT_NE(content.find("lib/arm64/libvault.so"), std::string::npos) << file;
+  }
+}
+
+// A name with the placeholder in it is told as it is: no path of a file's begins so.
+TEST_F(ManyFiles, NameThatLooksLikeAnInstallationIsTold) {
+  const ProcessResult run =
+      Do("mkdir '<install>'; cp good/base.apk '<install>'/; sim --journal journal "
+         "'<install>'/base.apk");
+  EXPECT_EQ(Told(run), Lines({"SIGNED  <install>/base.apk", "-> 0"}));
+  EXPECT_NE(ContentOf(folder_ / "journal")
+                .find("\"path\":\"" + folder_.path() + "/<install>/base.apk\",\"installed\":"),
+            std::string::npos);
+}
+
+// It is the user's.
+TEST_F(ManyFiles, ListIsNotOverwritten) {
+  const ProcessResult run =
+      Do("echo good/base.apk >list; sim --files-from list --journal list; cat list");
+  EXPECT_EQ(run.output, "good/base.apk\n");
+  EXPECT_NE(run.errors, "");
+}

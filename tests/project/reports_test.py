@@ -1,0 +1,152 @@
+#!/usr/bin/env python3
+"""Reads the JUnit reports and SARIF logs of real runs, of odd names as well.
+
+Arguments: the folder of the golden packages, and the words that start apktoolkit-sim.
+
+The reader of JUnit reports is junitparser. A SARIF log is held against SARIF below: of the standard
+(OASIS, SARIF 2.1.0) it has the objects and properties that the simulator writes, each with the
+constraints of its section: types, required properties, enumerated values, least lengths and ranges,
+and items that may not stand twice. A property that is not in it is an error, so that none is written
+unread. Of what no schema can say, the test has the indices (§3.4.5, §3.52.4) and the URIs (§3.4.3).
+"""
+
+import json
+import pathlib
+import shutil
+import subprocess
+import sys
+import tempfile
+import urllib.parse
+import zipfile
+
+import jsonschema
+import junitparser
+
+from sources import report
+
+
+def record(required, **properties):
+    return {"type": "object", "required": required, "properties": properties,
+            "additionalProperties": False}
+
+
+def listing(items, unique=False):
+    return {"type": "array", "items": items, "uniqueItems": unique}
+
+
+TEXT = {"type": "string"}
+INDEX = {"type": "integer", "minimum": 0}
+LEVEL = {"enum": ["none", "note", "warning", "error"]}  # §3.27.10
+MESSAGE = record(["text"], text=TEXT)  # §3.11, §3.12
+URI = {"type": "string", "format": "uri-reference"}
+LOCATION = record(["physicalLocation"], physicalLocation=record(  # §3.28, §3.29
+    ["artifactLocation"], artifactLocation=record(["uri"], uri=URI, index=INDEX)))  # §3.4
+RULE = record(["id"], id=TEXT, shortDescription=MESSAGE, help=MESSAGE,  # §3.49
+              defaultConfiguration=record([], level=LEVEL))  # §3.50
+DRIVER = record(["name"], name=TEXT, version=TEXT, rules=listing(RULE, unique=True))  # §3.19
+NOTIFICATION = record(["message"], message=MESSAGE, level=LEVEL, locations=listing(LOCATION))  # §3.58
+INVOCATION = record(["executionSuccessful"], executionSuccessful={"type": "boolean"},  # §3.20
+                    toolExecutionNotifications=listing(NOTIFICATION))
+ARTIFACT = record([], location=record([], uri=URI), length={"type": "integer", "minimum": -1},  # §3.24
+                  hashes={"type": "object", "additionalProperties": TEXT},
+                  roles=listing({"enum": ["analysisTarget"]}, unique=True))
+RESULT = record(["message"], ruleId=TEXT, ruleIndex=INDEX, level=LEVEL, message=MESSAGE,  # §3.27
+                locations=listing(LOCATION))
+RUN = record(["tool"], tool=record(["driver"], driver=DRIVER), invocations=listing(INVOCATION),  # §3.14
+             artifacts=listing(ARTIFACT, unique=True), results=listing(RESULT))
+SARIF = record(["version", "runs"], **{"$schema": URI}, version={"enum": ["2.1.0"]},  # §3.13
+               runs=listing(RUN))
+
+
+def run(simulator, folder, options, files):
+    """The verdict events, the JUnit suites and the SARIF log of one run."""
+    junit, sarif = folder / "junit.xml", folder / "log.sarif"
+    journal = subprocess.run([*simulator, "--json", "--junit", junit, "--sarif", sarif, *options, *files],
+                             capture_output=True, check=False).stdout
+    events = [json.loads(line) for line in journal.splitlines()]
+    verdicts = [event for event in events if event["event"] == "verdict"]
+    return verdicts, junitparser.JUnitXml.fromfile(str(junit)), json.loads(sarif.read_bytes())
+
+
+def junit_problems(verdicts, suites):
+    """Each file has a case, which passes where the status is 0, and fails where something was refused."""
+    cases = [case for suite in suites for case in suite]
+    problems = [] if len(cases) == len(verdicts) else [f"{len(verdicts)} files, {len(cases)} cases"]
+    for verdict, case in zip(verdicts, cases):
+        kinds = [type(result) for result in case.result]
+        expected = {0: [], 1: [junitparser.Failure]}.get(verdict["status"], [junitparser.Error])
+        if kinds != expected:
+            problems.append(f"{verdict['file']}: {verdict['verdict']} is {kinds}")
+        if kinds and verdict["items"][0]["state"] == "refused" and case.result[0].type != \
+                verdict["items"][0]["reason"] and verdict["status"] != 3:
+            problems.append(f"{verdict['file']}: the case has the type {case.result[0].type}")
+    counts = (suites.tests, suites.failures, suites.errors)
+    expected = (len(verdicts), sum(verdict["status"] == 1 for verdict in verdicts),
+                sum(verdict["status"] > 1 for verdict in verdicts))
+    return problems + ([] if counts == expected else [f"counts {counts}, and not {expected}"])
+
+
+def sarif_problems(verdicts, log):
+    """The log is as the standard has it, and has what the verdicts have."""
+    problems = [f"{error.json_path}: {error.message}"
+                for error in jsonschema.Draft202012Validator(SARIF).iter_errors(log)]
+    (made,) = log["runs"]
+    for result in made["results"]:
+        place = result["locations"][0]["physicalLocation"]["artifactLocation"]
+        if made["artifacts"][place["index"]]["location"]["uri"] != place["uri"]:
+            problems.append(f"{place} is another artifact")
+        if made["tool"]["driver"]["rules"][result["ruleIndex"]]["id"] != result["ruleId"]:
+            problems.append(f"{result['ruleId']} is another rule")
+    found = [(result["ruleId"], result["level"]) for result in made["results"]]
+    expected = []
+    for verdict in verdicts:
+        expected += [(item["reason"], "error") for item in verdict["items"] if item["state"] == "refused"]
+        expected += [(warning["reason"], "warning") for warning in verdict["warnings"]]
+    if found != expected:
+        problems.append(f"results {found}, and not {expected}")
+    if made["invocations"][0]["executionSuccessful"] != all(v["status"] < 3 for v in verdicts):
+        problems.append("the run was successful or not, and the log says otherwise")
+    return problems
+
+
+def odd_files(package, folder):
+    """Copies of a package under names with everything in them that XML, JSON and URIs give a meaning."""
+    for name in (b"a b&<>\"'.apk", b"]]>.apk", b"http:x?a#b%41.apk", b"line\nend\x01.apk", b"\xe9\xff.apk",
+                 "\u202egr\u00fcn\ufffe\U0001f600.apk".encode()):
+        path = folder / name.decode(errors="surrogateescape")
+        shutil.copy(package, path)
+        yield path
+
+
+def main():
+    golden, *simulator = sys.argv[1:]
+    packages = sorted(pathlib.Path(golden).glob("*/base.apk"))
+    problems = []
+    with tempfile.TemporaryDirectory() as name:
+        folder = pathlib.Path(name)
+        jar = folder / "library.jar"
+        with zipfile.ZipFile(jar, "w") as archive:
+            archive.writestr("a.txt", "a")
+        package = pathlib.Path(golden) / "apksigner-sha256-2048/base.apk"
+        odd = list(odd_files(package, folder))
+        files = [*packages, *odd, jar, folder / "absent.apk", folder, package, package]
+        seen = set()
+        for options, some in ([], files), (["--werror", "--signer", "0" * 64], files), \
+                (["--integrity", "ffffffff", "--timeout", "0.5"], [package]), ([], [package]):
+            verdicts, suites, log = run(simulator, folder, options, some)
+            if len(verdicts) != len(some):
+                problems.append(f"{len(some)} files, {len(verdicts)} verdicts")
+            problems += junit_problems(verdicts, suites) + sarif_problems(verdicts, log)
+            seen |= {verdict["status"] for verdict in verdicts}
+            paths = [urllib.parse.unquote_to_bytes(artifact["location"]["uri"]).removeprefix(b"file://")
+                     for artifact in log["runs"][0]["artifacts"]]
+            for file in some:
+                if str(file).encode(errors="surrogateescape") not in paths:
+                    problems.append(f"{file!r} is no artifact")
+        if seen != {0, 1, 3, 4}:
+            problems.append(f"no run for each status: {seen}")
+    return report(problems)
+
+
+if __name__ == "__main__":
+    sys.exit(main())

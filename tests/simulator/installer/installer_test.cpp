@@ -1,0 +1,156 @@
+// The process that is asked, with programs of the test's own in the place of java.
+#include "simulator/installer/installer.h"
+
+#include <gtest/gtest.h>
+#include <sys/stat.h>
+
+#include <cstdlib>
+
+#include "support/files.h"
+#include "support/package.h"
+#include "support/process.h"
+#include "support/simulation.h"
+
+using namespace simulator;
+
+namespace {
+
+// A script that is called java, first on the path, for as long as this lives.
+class FakeJava {
+ public:
+  explicit FakeJava(const std::string& script) : path_(getenv("PATH")) {
+    const std::string java = folder_.Write("java", ToBytes("#!/bin/bash\n" + script));
+    chmod(java.c_str(), 0755);
+    setenv("PATH", (folder_.path() + ":" + path_).c_str(), 1);
+  }
+  ~FakeJava() { setenv("PATH", path_.c_str(), 1); }
+
+  std::string operator/(const std::string& name) const { return folder_ / name; }
+
+ private:
+  const TempDir folder_;
+  const std::string path_;
+};
+
+constexpr char kRefusal[] =
+    R"({"ranges":[{"first":27,"last":30,"verified":false,"schemes":[],"signers":[],)"
+    R"("errors":[{"issue":"A","parameters":[],"text":""}],"warnings":[]}]})";
+
+InstallerOptions Patient(double seconds) {
+  InstallerOptions options;
+  options.timeout = seconds;
+  options.program = "/proc/self/exe";  // nobody runs it
+  return options;
+}
+
+}  // namespace
+
+TEST(InstallerProcess, GetsTheLevelsAndOnePathALine) {
+  const FakeJava java(
+      "echo \"${@: -2}\" >>\"$(dirname \"$0\")/asked\"\n"
+      "while read -r path; do cp \"$path\" \"$(dirname \"$0\")/copy\"\necho '" +
+      std::string(kRefusal) + "'; done");
+  const DiskFile package(MakePackage().Build());
+  InstallerOptions options = Patient(30);
+  options.levels = {28, 33};
+  Installer installer(options);
+  EXPECT_EQ(installer.Judge(package.path()).state, Judgement::State::kJudged);
+  EXPECT_EQ(ContentOf(java / "copy"), ContentOf(package.path()));
+  // One process serves all.
+  EXPECT_EQ(installer.Judge(package.path()).state, Judgement::State::kJudged);
+  EXPECT_EQ(ContentOf(java / "asked"), "28 33\n");
+}
+
+TEST(InstallerProcess, IsStartedForAPackageAlone) {
+  const FakeJava java("touch \"$(dirname \"$0\")/started\"");
+  const DiskFile text(ToBytes("no archive")), jar(MakePackage(PlainJar()).Build());
+  const InstallerOptions options = Patient(30);
+  Installer installer(options);
+  for (const std::string& file : {text.path(), jar.path(), std::string("/nowhere"),
+                                  std::string("/dev/zero"), std::string("/tmp")}) {
+    EXPECT_EQ(installer.Judge(file).state, Judgement::State::kNotAsked) << file;
+  }
+  EXPECT_EQ(ContentOf(java / "started"), "");
+  EXPECT_NE(RunProcess({"test", "-e", java / "started"}).status, 0);
+}
+
+TEST(InstallerProcess, ThatIsOffIsNotStarted) {
+  const FakeJava java("touch \"$(dirname \"$0\")/started\"");
+  const DiskFile package(MakePackage().Build());
+  InstallerOptions options = Patient(30);
+  options.use = InstallerUse::kOff;
+  EXPECT_EQ(Installer(options).Judge(package.path()).state, Judgement::State::kNotAsked);
+  EXPECT_NE(RunProcess({"test", "-e", java / "started"}).status, 0);
+}
+
+// The second package gets an answer from another process.
+TEST(InstallerProcess, IsStartedAgainWhenItEnds) {
+  const FakeJava java(
+      "if [[ ! -e $0.was ]]; then touch \"$0.was\"; read -r path; exit 1; fi\n"
+      "while read -r path; do echo '" +
+      std::string(kRefusal) + "'; done");
+  const DiskFile package(MakePackage().Build());
+  const InstallerOptions options = Patient(30);
+  Installer installer(options);
+  const Judgement first = installer.Judge(package.path());
+  EXPECT_EQ(first.state, Judgement::State::kGaveUp);
+  EXPECT_EQ(first.why, "it ended");
+  EXPECT_EQ(installer.Judge(package.path()).state, Judgement::State::kJudged);
+}
+
+TEST(InstallerProcess, IsEndedAndStartedAgainWhenTheTimeIsUp) {
+  const FakeJava java(
+      "if [[ ! -e $0.was ]]; then echo $$ >\"$0.was\"; exec sleep 60; fi\n"
+      "while read -r path; do echo '" +
+      std::string(kRefusal) + "'; done");
+  const DiskFile package(MakePackage().Build());
+  const InstallerOptions options = Patient(1.5);
+  Installer installer(options);
+  const Judgement first = installer.Judge(package.path());
+  EXPECT_EQ(first.state, Judgement::State::kGaveUp);
+  EXPECT_EQ(first.why, "it was still busy after 1.5 s");
+  const std::string pid = ContentOf(java / "java.was");
+  EXPECT_NE(RunProcess({"bash", "-c", "kill -0 " + pid}).status, 0) << "the first has ended";
+  EXPECT_EQ(installer.Judge(package.path()).state, Judgement::State::kJudged);
+}
+
+TEST(InstallerProcess, ThatDoesNotStopSayingIsNoAnswer) {
+  const FakeJava java("tr '\\0' x </dev/zero");
+  const DiskFile package(MakePackage().Build());
+  const InstallerOptions options = Patient(60);
+  EXPECT_EQ(Installer(options).Judge(package.path()).state, Judgement::State::kGaveUp);
+}
+
+// ---- What the user is told of it.
+
+TEST(InstallerProcess, ThatGaveUpMakesNoSuccess) {
+  const FakeJava java("read -r path");
+  const DiskFile package(MakePackage().Build());
+  const ProcessResult run = RunProcess({"env", "LC_ALL=C.UTF-8", SimulatorPath(), package.path()});
+  EXPECT_EQ(run.status, 3);
+  EXPECT_EQ(run.output.substr(0, 15), "NOT SIMULATED  ");
+  EXPECT_NE(run.output.find("the installer's verifier gave up: it ended\n"), std::string::npos)
+      << run.output;
+  EXPECT_EQ(run.errors,
+            "apktoolkit-sim: " + package.path() + ": the installer's verifier gave up: it ended\n");
+}
+
+TEST(InstallerProcess, ThatIsMissingIsToldOnce) {
+  const DiskFile package(MakePackage().Build());
+  const auto run = [&](const std::string& when) {
+    return RunProcess(
+        {"env", "PATH=/nowhere", SimulatorPath(), "--quiet", when, package.path(), package.path()});
+  };
+  const ProcessResult without = run("--installer=auto");
+  EXPECT_EQ(without.status, 0);
+  EXPECT_EQ(without.errors,
+            "apktoolkit-sim: no phone's installer was asked: there is no java: apt-get install "
+            "default-jre-headless libapksig-java\n");
+  const ProcessResult required = run("--installer=required");
+  EXPECT_EQ(required.status, 3);
+  EXPECT_EQ(required.output, "");
+  EXPECT_EQ(required.errors,
+            "apktoolkit-sim: there is no java: apt-get install default-jre-headless "
+            "libapksig-java\n");
+  EXPECT_EQ(run("--installer=off").errors, "");
+}

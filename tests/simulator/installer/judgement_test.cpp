@@ -1,0 +1,83 @@
+#include "simulator/installer/judgement.h"
+
+#include <gtest/gtest.h>
+
+#include "support/certificate.h"
+
+using namespace simulator;
+
+namespace {
+
+std::string Hexadecimal(const Bytes& bytes) { return Hex(bytes); }
+
+// One range with these members in place of good ones.
+std::string Answer(const std::string& verified, const std::string& signers,
+                   const std::string& errors) {
+  return R"({"ranges":[{"first":27,"last":2147483647,"verified":)" + verified +
+         R"(,"schemes":["v2"],"signers":)" + signers + R"(,"errors":)" + errors +
+         R"(,"warnings":[]}]})";
+}
+
+const std::string kSigner =
+    R"([{"scheme":"v2","certificate":")" + Hexadecimal(Certificate().Build()) + R"("}])";
+constexpr char kError[] = R"([{"issue":"A_FAULT","parameters":["a","b"],"text":"a b"}])";
+
+std::string WhyNone(const std::string& answer) {
+  const Judgement judgement = ParseJudgement(answer);
+  EXPECT_EQ(judgement.state, Judgement::State::kGaveUp) << answer;
+  EXPECT_TRUE(judgement.ranges.empty());
+  return judgement.why;
+}
+
+}  // namespace
+
+TEST(Judgement, HasSchemesAndSignersOfWhatIsVerified) {
+  const Judgement judgement = ParseJudgement(Answer("true", kSigner, "[]"));
+  EXPECT_EQ(judgement.state, Judgement::State::kJudged);
+  ASSERT_EQ(judgement.ranges.size(), 1U);
+  const RangeJudgement& range = judgement.ranges[0];
+  EXPECT_EQ(range.levels.first, 27);
+  EXPECT_EQ(range.levels.last, kNewestLevel);
+  EXPECT_TRUE(range.is_verified);
+  EXPECT_EQ(range.schemes, std::vector<std::string>({"v2"}));
+  ASSERT_EQ(range.signers.size(), 1U);
+  EXPECT_EQ(range.signers[0].scheme, "v2");
+  EXPECT_EQ(range.signers[0].certificate.subject, "CN=Test");
+  EXPECT_EQ(range.signers[0].certificate.key.bits, 2048);
+}
+
+TEST(Judgement, HasTheErrorsOfWhatIsRefused) {
+  const Judgement judgement = ParseJudgement(Answer("false", "[]", kError));
+  ASSERT_EQ(judgement.ranges.size(), 1U);
+  EXPECT_FALSE(judgement.ranges[0].is_verified);
+  ASSERT_EQ(judgement.ranges[0].errors.size(), 1U);
+  const InstallerIssue& error = judgement.ranges[0].errors[0];
+  EXPECT_EQ(error.name, "A_FAULT");
+  EXPECT_EQ(error.parameters, std::vector<std::string>({"a", "b"}));
+  EXPECT_EQ(error.text, "a b");
+}
+
+TEST(Judgement, FailureIsNoAnswer) {
+  EXPECT_EQ(WhyNone(R"({"failure":"java.lang.OutOfMemoryError"})"), "java.lang.OutOfMemoryError");
+}
+
+TEST(Judgement, WhatDoesNotReadIsNoAnswer) {
+  for (const std::string& answer :
+       {std::string(), std::string("nonsense"), std::string("[]"), std::string("{}"),
+        std::string(R"({"ranges":[]})"), std::string(R"({"ranges":{}})"),
+        std::string(R"({"ranges":[1]})"), std::string(R"({"ranges":[{"first":27}]})"),
+        Answer("1", kSigner, "[]"), Answer("true", "1", "[]"), Answer("true", "[1]", "[]"),
+        Answer("true", R"([{"scheme":"v2","certificate":"zz"}])", "[]"),
+        Answer("true", R"([{"scheme":"v2","certificate":"3000"}])", "[]"),
+        Answer("false", "[]", "1"), Answer("false", "[]", "[1]"),
+        Answer("false", "[]", R"([{"issue":"A","parameters":[1],"text":""}])")}) {
+    EXPECT_EQ(WhyNone(answer), "its answer does not read") << answer;
+  }
+}
+
+// Otherwise a package could be installable with errors, or for nobody.
+TEST(Judgement, AnswerThatContradictsItselfIsNone) {
+  EXPECT_EQ(WhyNone(Answer("true", kSigner, kError)), "its answer does not read");
+  EXPECT_EQ(WhyNone(Answer("true", "[]", "[]")), "its answer does not read");
+  EXPECT_EQ(WhyNone(Answer("false", "[]", "[]")), "its answer does not read");
+}

@@ -1,0 +1,386 @@
+#include "simulator/verdict/gate.h"
+
+#include <gtest/gtest.h>
+
+using namespace simulator;
+
+namespace {
+
+using Lines = std::vector<std::string>;
+
+CertificateFacts SignerWith(char digit) {
+  CertificateFacts signer;
+  signer.subject = std::string("CN=") + digit;
+  signer.sha256 = digit + std::string(63, '1');
+  signer.key = {"RSA", 2048, digit + std::string(63, '2'), digit + std::string(63, '3')};
+  return signer;
+}
+
+const CertificateFacts kOwner = SignerWith('a');
+const CertificateFacts kOther = SignerWith('b');
+const CertificateFacts kThird = SignerWith('c');
+
+// Of a package that the tool verified and the kernel signed.
+Report SignedBy(const CertificateFacts& signer, const std::string& file = "base.apk") {
+  Report report;
+  report.file = file;
+  report.verdict = Verdict::kSigned;
+  report.package_name = "com.app";
+  report.items = {{ItemKind::kPackage, "package", "", ItemState::kDone, {}, true}};
+  report.signer = signer;
+  report.key = {signer.key.modulus_sha256, 2048, true};
+  return report;
+}
+
+// The judgement of phones that take it by these signers.
+RangeJudgement Takes(int first, const std::vector<InstallerSigner>& signers) {
+  RangeJudgement range;
+  range.levels = {first, kNewestLevel};
+  range.is_verified = true;
+  range.signers = signers;
+  return range;
+}
+
+Report InstalledFor(Report report, const std::vector<RangeJudgement>& ranges) {
+  report.installer = {Judgement::State::kJudged, "", ranges};
+  return report;
+}
+
+// The code of each item that the gate adds.
+Lines Added(const Report& before, const Report& after) {
+  Lines codes;
+  for (size_t i = before.items.size(); i < after.items.size(); ++i) {
+    EXPECT_EQ(after.items[i].state, ItemState::kRefused);
+    codes.emplace_back(after.items[i].reason.cause->code);
+  }
+  return codes;
+}
+
+// What becomes of one file where these signers are expected.
+struct Judged {
+  Lines codes;
+  Verdict verdict;
+};
+
+Judged With(const Lines& signers, const Report& report) {
+  GateOptions options;
+  options.signers = signers;
+  Report judged = report;
+  Gate(options).Judge(&judged);
+  return {Added(report, judged), judged.verdict};
+}
+
+void ExpectTaken(const Lines& signers, const Report& report) {
+  const Judged judged = With(signers, report);
+  EXPECT_EQ(judged.codes, Lines());
+  EXPECT_EQ(judged.verdict, report.verdict);
+}
+
+void ExpectUnexpected(const Lines& signers, const Report& report) {
+  const Judged judged = With(signers, report);
+  EXPECT_EQ(judged.codes, Lines({"signer-unexpected"}));
+  EXPECT_EQ(judged.verdict, Verdict::kNotAccepted);
+}
+
+}  // namespace
+
+TEST(ReadDigest, TakesTheFormsInWhichToolsPrintIt) {
+  const std::string digest = "0123456789abcdef0123456789abcdef0123456789abcdef0123456789abcdef";
+  EXPECT_EQ(ReadDigest(digest), digest);
+  EXPECT_EQ(ReadDigest("0123456789ABCDEF0123456789ABCDEF0123456789ABCDEF0123456789ABCDEF"), digest);
+  EXPECT_EQ(ReadDigest("01:23:45:67:89:AB:CD:EF:01:23:45:67:89:AB:CD:EF:"
+                       "01:23:45:67:89:ab:cd:ef:01:23:45:67:89:ab:cd:ef"),
+            digest);
+}
+
+TEST(ReadDigest, TakesNothingElse) {
+  const std::string digits(62, '0');
+  for (const std::string& text :
+       {std::string(), digits, digits + "000", digits + "0", digits + "0g", digits + " 0",
+        "0x" + digits, digits + "0\n", ":" + digits + "0", digits + ":00",
+        // The length is that of pairs with colons, and the colons are elsewhere.
+        std::string(64, '0') + std::string(31, ':'), std::string(95, '0'), std::string(95, ':')}) {
+    EXPECT_EQ(ReadDigest(text), std::nullopt) << text;
+  }
+}
+
+TEST(Gate, WithoutADemandTakesEverything) { ExpectTaken({}, SignedBy(kOwner)); }
+
+TEST(Gate, SignerIsKnownByEachOfHisDigests) {
+  for (const std::string& digest : {kOwner.sha256, kOwner.key.sha256, kOwner.key.modulus_sha256}) {
+    ExpectTaken({digest}, SignedBy(kOwner));
+    ExpectTaken({kOther.sha256, digest}, SignedBy(kOwner));
+    ExpectUnexpected({digest}, SignedBy(kOther));
+  }
+}
+
+TEST(Gate, SaysWhoIsExpectedAndWhoSigned) {
+  GateOptions options;
+  options.signers = {kOwner.sha256, kThird.key.sha256};
+  Report report = SignedBy(kOther);
+  Gate(options).Judge(&report);
+  EXPECT_EQ(report.items[1].kind, ItemKind::kSigner);
+  EXPECT_EQ(report.items[1].reason.Text(),
+            "its signer is none that --signer names: expected " + kOwner.sha256 + " or " +
+                kThird.key.sha256 +
+                ", and the JAR signature is by CN=b (SHA-256 digest of the "
+                "certificate " +
+                kOther.sha256 + ", of the public key " + kOther.key.sha256 + ", of the modulus " +
+                kOther.key.modulus_sha256 + ")");
+}
+
+// The kernel gets the modulus. A certificate that shows another key is a decoy.
+TEST(Gate, CertificateOfAnotherKeyThanTheKernelGetsCountsForNothing) {
+  Report report = SignedBy(kOwner);
+  report.key->sha256 = kOther.key.modulus_sha256;
+  ExpectUnexpected({kOwner.sha256}, report);
+  ExpectUnexpected({kOwner.key.sha256}, report);
+  ExpectUnexpected({kOwner.key.modulus_sha256}, report);
+  ExpectTaken({kOther.key.modulus_sha256}, report);
+}
+
+TEST(Gate, KeyWithoutACertificateIsKnownByItsModulus) {
+  Report report = SignedBy(kOwner);
+  report.signer.reset();
+  ExpectTaken({kOwner.key.modulus_sha256}, report);
+  ExpectUnexpected({kOwner.sha256}, report);
+  report.key.reset();
+  ExpectUnexpected({kOwner.key.modulus_sha256}, report);
+}
+
+// Anyone can put the owner's modulus behind an exponent of his own.
+TEST(Gate, ForgeableKeyIsNobodys) {
+  Report report = SignedBy(kOwner);
+  report.warnings = {{&cause::kForgeableKey, "1"}};
+  ExpectUnexpected({kOwner.key.modulus_sha256}, report);
+  report.warnings = {{&cause::kWeakKey, "1"}};
+  ExpectTaken({kOwner.key.modulus_sha256}, report);
+}
+
+TEST(Gate, SignersOfTheNewestSchemeMustBeExpectedAsWell) {
+  const Lines owner = {kOwner.sha256};
+  const RangeJudgement all_own = Takes(27, {{"v1", kOwner}, {"v2", kOwner}});
+  ExpectTaken(owner, InstalledFor(SignedBy(kOwner), {all_own}));
+  // An older scheme is nobody's concern.
+  ExpectTaken(owner, InstalledFor(SignedBy(kOwner), {Takes(27, {{"v2", kOther}, {"v3", kOwner}})}));
+  const Report other =
+      InstalledFor(SignedBy(kOwner), {Takes(27, {{"v2", kOwner}, {"v3", kOther}})});
+  ExpectUnexpected(owner, other);
+  ExpectTaken({kOwner.sha256, kOther.sha256}, other);
+  // Each of several signers, and those of phones of any level.
+  ExpectUnexpected(owner,
+                   InstalledFor(SignedBy(kOwner), {Takes(27, {{"v2", kOther}, {"v2", kOwner}})}));
+  ExpectUnexpected(owner, InstalledFor(SignedBy(kOwner), {all_own, Takes(33, {{"v3", kOther}})}));
+  ExpectUnexpected(owner, InstalledFor(SignedBy(kOwner), {Takes(27, {{"v2", kOther}}), all_own}));
+  // Phones that refuse the package install it for nobody.
+  RangeJudgement refuses = Takes(33, {{"v3", kOther}});
+  refuses.is_verified = false;
+  ExpectTaken(owner, InstalledFor(SignedBy(kOwner), {all_own, refuses}));
+}
+
+TEST(Gate, SameSignerIsNotToldTwice) {
+  const Report report = InstalledFor(
+      SignedBy(kOther),
+      {Takes(27, {{"v2", kOther}}), Takes(30, {{"v3", kThird}}), Takes(33, {{"v3", kThird}})});
+  EXPECT_EQ(With({kOwner.sha256}, report).codes, Lines({"signer-unexpected", "signer-unexpected"}));
+}
+
+TEST(Gate, SignerOfWhatWasNotVerifiedIsNotKnown) {
+  Report report = SignedBy(kOwner);
+  report.verdict = Verdict::kRefused;
+  report.items[0] = {ItemKind::kPackage,        "package", "", ItemState::kRefused,
+                     {&cause::kDexChanged, ""}, false};
+  const Judged judged = With({kOwner.sha256}, report);
+  EXPECT_EQ(judged.codes, Lines({"signer-not-verified"}));
+  EXPECT_EQ(judged.verdict, Verdict::kRefused);
+  // The tool verified it, and the kernel refused.
+  report.items[0].is_verified = true;
+  EXPECT_EQ(With({kOwner.sha256}, report).codes, Lines());
+  EXPECT_EQ(With({kOther.sha256}, report).codes, Lines({"signer-unexpected"}));
+}
+
+TEST(Gate, TrustedJarHasNoSigner) {
+  Report report;
+  report.verdict = Verdict::kTrustedJar;
+  report.items = {{ItemKind::kJar, "JAR", "", ItemState::kDone, {}}};
+  const Judged judged = With({kOwner.sha256}, report);
+  EXPECT_EQ(judged.codes, Lines({"signer-none"}));
+  EXPECT_EQ(judged.verdict, Verdict::kNotAccepted);
+  ExpectTaken({}, report);
+}
+
+TEST(Gate, FileThatWasNotLookedAtIsLeftAsItIs) {
+  for (const Verdict verdict : {Verdict::kNotLookedAt, Verdict::kNotSimulated}) {
+    Report report = SignedBy(kOther);
+    report.verdict = verdict;
+    ExpectTaken({kOwner.sha256}, report);
+  }
+}
+
+TEST(Gate, MakesNoVerdictBetter) {
+  for (const Verdict verdict :
+       {Verdict::kPartlySigned, Verdict::kNotInstallable, Verdict::kRefused}) {
+    Report report = SignedBy(kOther);
+    report.verdict = verdict;
+    EXPECT_EQ(With({kOwner.sha256}, report).verdict, verdict);
+  }
+  Report report = SignedBy(kOther);
+  report.verdict = Verdict::kOtherSigner;
+  EXPECT_EQ(With({kOwner.sha256}, report).verdict, Verdict::kNotAccepted);
+}
+
+// ---- Warnings.
+
+namespace {
+
+// The same where warnings count as refusals.
+Judged WithoutWarnings(const Report& report, const Lines& signers = {}) {
+  GateOptions options;
+  options.refuses_warnings = true;
+  options.signers = signers;
+  Report judged = report;
+  Gate(options).Judge(&judged);
+  EXPECT_EQ(judged.warnings.size(), report.warnings.size());
+  return {Added(report, judged), judged.verdict};
+}
+
+}  // namespace
+
+TEST(GateOfWarnings, RefusesWhatThereIsAWarningOf) {
+  Report report = SignedBy(kOwner);
+  const Judged good = WithoutWarnings(report);
+  EXPECT_EQ(good.codes, Lines());
+  EXPECT_EQ(good.verdict, Verdict::kSigned);
+  report.warnings = {{&cause::kWeakKey, "1024"}};
+  const Judged judged = WithoutWarnings(report);
+  EXPECT_EQ(judged.codes, Lines({"warnings-refused"}));
+  EXPECT_EQ(judged.verdict, Verdict::kNotAccepted);
+  ExpectTaken({kOwner.sha256}, report);
+}
+
+TEST(GateOfWarnings, SaysTheFirstAndHowManyMore) {
+  GateOptions options;
+  options.refuses_warnings = true;
+  Report report = SignedBy(kOwner);
+  report.warnings = {{&cause::kWeakKey, "1024"}, {&cause::kDebugKey, ""}, {&cause::kDebugKey, ""}};
+  Gate(options).Judge(&report);
+  EXPECT_EQ(report.items[1].kind, ItemKind::kWarnings);
+  EXPECT_EQ(report.items[1].reason.Text(),
+            "a warning counts as a refusal (--werror): its RSA key has 1024 bits, and 2048 are the "
+            "least that is safe (and 2 more)");
+}
+
+TEST(GateOfWarnings, AnotherSignerOfTheNewestSchemeCountsAsOne) {
+  Report report = InstalledFor(SignedBy(kOwner), {Takes(27, {{"v2", kOther}})});
+  report.verdict = Verdict::kOtherSigner;
+  GateOptions options;
+  options.refuses_warnings = true;
+  Gate(options).Judge(&report);
+  EXPECT_EQ(report.verdict, Verdict::kNotAccepted);
+  EXPECT_EQ(report.items[1].reason.detail, "phones install it for another signer, CN=b");
+}
+
+// The signer's reason comes first, and both are told.
+TEST(GateOfWarnings, ComesBehindTheSigner) {
+  Report report = SignedBy(kOther);
+  report.warnings = {{&cause::kWeakKey, "1024"}};
+  EXPECT_EQ(WithoutWarnings(report, {kOwner.sha256}).codes,
+            Lines({"signer-unexpected", "warnings-refused"}));
+}
+
+TEST(GateOfWarnings, WhatIsRefusedAnywayStaysAsItIs) {
+  for (const Verdict verdict : {Verdict::kRefused, Verdict::kPartlySigned, Verdict::kNotInstallable,
+                                Verdict::kNotLookedAt, Verdict::kNotSimulated}) {
+    Report report = SignedBy(kOwner);
+    report.verdict = verdict;
+    report.warnings = {{&cause::kWeakKey, "1024"}};
+    EXPECT_EQ(WithoutWarnings(report).codes, Lines());
+    EXPECT_EQ(WithoutWarnings(report).verdict, verdict);
+  }
+}
+
+// ---- Files of one package.
+
+namespace {
+
+// The code that the last of the files gets; all before it get none.
+Lines AfterOthers(std::vector<Report> reports) {
+  const GateOptions options;
+  Gate gate(options);
+  for (Report& report : reports) {
+    const Report before = report;
+    gate.Judge(&report);
+    if (&report == &reports.back()) return Added(before, report);
+    EXPECT_EQ(Added(before, report), Lines());
+  }
+  return {};
+}
+
+}  // namespace
+
+TEST(GateOfOnePackage, TakesOneSigner) {
+  EXPECT_EQ(AfterOthers({SignedBy(kOwner), SignedBy(kOwner, "split.apk")}), Lines());
+}
+
+TEST(GateOfOnePackage, SaysWhichFileDiffersFromWhich) {
+  const GateOptions options;
+  Gate gate(options);
+  Report base = SignedBy(kOwner), split = SignedBy(kOther, "split.apk");
+  gate.Judge(&base);
+  gate.Judge(&split);
+  EXPECT_EQ(base.verdict, Verdict::kSigned);
+  EXPECT_EQ(split.verdict, Verdict::kNotAccepted);
+  const std::string text = split.items[1].reason.Text();
+  EXPECT_EQ(text.substr(0, text.find(" (SHA")),
+            "the files of a package must have one signer: base.apk of com.app is by CN=a");
+  EXPECT_NE(text.find(", and this one by CN=b (SHA-256 digest of the certificate " + kOther.sha256),
+            std::string::npos);
+}
+
+TEST(GateOfOnePackage, ComparesEachWithTheFirst) {
+  EXPECT_EQ(AfterOthers({SignedBy(kOwner), SignedBy(kOwner), SignedBy(kOther)}),
+            Lines({"signer-differs"}));
+  const GateOptions options;
+  Gate gate(options);
+  Report first = SignedBy(kOwner), second = SignedBy(kOther), third = SignedBy(kOwner);
+  for (Report* const report : {&first, &second, &third}) gate.Judge(report);
+  EXPECT_EQ(second.verdict, Verdict::kNotAccepted);
+  EXPECT_EQ(third.verdict, Verdict::kSigned);
+}
+
+// Phones compare certificates, and the kernel compares keys.
+TEST(GateOfOnePackage, AnotherCertificateOrKeyIsAnotherSigner) {
+  CertificateFacts renewed = kOwner;
+  renewed.sha256 = kThird.sha256;
+  EXPECT_EQ(AfterOthers({SignedBy(kOwner), SignedBy(renewed)}), Lines({"signer-differs"}));
+  Report report = SignedBy(kOwner);
+  report.key->sha256 = kOther.key.modulus_sha256;
+  EXPECT_EQ(AfterOthers({SignedBy(kOwner), report}), Lines({"signer-differs"}));
+}
+
+TEST(GateOfOnePackage, SignersOfTheNewestSchemeAreComparedWhereBothWereJudged) {
+  const Report by_owner = InstalledFor(SignedBy(kOwner), {Takes(27, {{"v2", kOwner}})});
+  const Report by_other = InstalledFor(
+      SignedBy(kOwner), {Takes(27, {{"v2", kOwner}}), Takes(28, {{"v2", kOwner}, {"v3", kOther}})});
+  EXPECT_EQ(AfterOthers({by_owner, by_owner}), Lines());
+  EXPECT_EQ(AfterOthers({by_owner, by_other}), Lines({"signer-differs"}));
+  EXPECT_EQ(AfterOthers({SignedBy(kOwner), by_other}), Lines());
+  EXPECT_EQ(AfterOthers({by_other, SignedBy(kOwner)}), Lines());
+}
+
+TEST(GateOfOnePackage, OthersAreNotCompared) {
+  Report other_package = SignedBy(kOther);
+  other_package.package_name = "com.other";
+  EXPECT_EQ(AfterOthers({SignedBy(kOwner), other_package}), Lines());
+  Report nameless = SignedBy(kOwner);
+  nameless.package_name = "";
+  Report other_nameless = SignedBy(kOther);
+  other_nameless.package_name = "";
+  EXPECT_EQ(AfterOthers({nameless, other_nameless}), Lines());
+  // A file that was refused claims its signer, and can accuse no other file.
+  Report refused = SignedBy(kOther);
+  refused.verdict = Verdict::kRefused;
+  refused.items[0].is_verified = false;
+  EXPECT_EQ(AfterOthers({refused, SignedBy(kOwner)}), Lines());
+  EXPECT_EQ(AfterOthers({SignedBy(kOwner), refused}), Lines());
+}
