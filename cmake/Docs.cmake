@@ -1,6 +1,6 @@
 # Installs manual pages, completion and docs beside the programs.
 install(FILES man/apktoolkit.1 man/apktoolkit-verify.1 DESTINATION ${CMAKE_INSTALL_MANDIR}/man1)
-install(FILES README.md CHANGES.md SECURITY.md DESTINATION ${CMAKE_INSTALL_DOCDIR})
+install(FILES README.md CHANGES.md CONTRIBUTING.md SECURITY.md DESTINATION ${CMAKE_INSTALL_DOCDIR})
 install(DIRECTORY docs DESTINATION ${CMAKE_INSTALL_DOCDIR})
 if(APKTOOLKIT_SIMULATOR)
   install(FILES man/apktoolkit-sim.1 DESTINATION ${CMAKE_INSTALL_MANDIR}/man1)

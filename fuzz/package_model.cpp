@@ -6,6 +6,7 @@
 #include <filesystem>
 #include <optional>
 
+#include "apk/native_libraries.h"
 #include "fuzz/models.h"
 #include "fuzz/signature_model.h"
 #include "support/certificate.h"
@@ -16,21 +17,6 @@ constexpr size_t kLongestEntry = 128 << 20;
 
 bool EndsIn(const std::string& text, const std::string& end) {
   return text.size() >= end.size() && text.compare(text.size() - end.size(), end.size(), end) == 0;
-}
-
-// The path where the installer puts a library. The longest matching prefix decides.
-std::string Installed(const std::string& entry) {
-  static const auto& directories = *new std::map<std::string, std::string>{
-      {"lib/armeabi", "lib/arm"},
-      {"lib/armeabi-v7a", "lib/arm"},
-      {"lib/armeabi-v8a", "lib/arm64"},
-      {"lib/arm64-v8a", "lib/arm64"},
-  };
-  std::string longest;
-  for (const auto& [prefix, directory] : directories) {
-    if (entry.rfind(prefix, 0) == 0 && prefix.size() > longest.size()) longest = prefix;
-  }
-  return longest.empty() ? "" : directories.at(longest) + entry.substr(longest.size());
 }
 
 }  // namespace
@@ -149,7 +135,7 @@ bool PackageModel::StatesDigestOf(const Bytes& manifest, const ManifestModel& si
 bool PackageModel::AllowsLibrary(const std::string& directory, const std::string& path,
                                  const Bytes& content) const {
   for (const std::string& entry : libraries_) {
-    const std::string installed = Installed(entry);
+    const std::string installed = ApkTools::InstalledLibraryPath("", entry);
     if (installed.empty() || !IsListed(entry, content)) continue;
     // The tool passes the name to the system as a C string, which ends at the first NUL.
     const std::string target = (directory + installed).c_str();

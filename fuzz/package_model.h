@@ -1,6 +1,7 @@
 // Computes a second time what may be done for an archive. It judges the package target. It reads
 // the archive through the platform's zip library, as the tool does. It reads texts with models.h,
 // checks signatures with libcrypto, and compares digests in one straight walk.
+// It asks the tool where a library lies; tests/apk/native_libraries_test.cpp pins those paths.
 #pragma once
 
 #include <map>

@@ -7,27 +7,25 @@
 #include <string_view>
 
 #include "simulator/phone/stand_in.h"
+#include "util/log.h"
 
 namespace simulator {
 
 namespace {
-
-// The log cuts a record's text to this size, the closing NUL included.
-constexpr size_t kTextSize = 1024;
 
 constexpr int kWritten = 1;
 
 int Log(int priority, const char* tag, const char* text) {
   Event event("log");
   event.Number("priority", priority).Text("tag", tag == nullptr ? "" : tag);
-  Record(event.Text("text", std::string_view(text).substr(0, kTextSize - 1)));
+  Record(event.Text("text", std::string_view(text).substr(0, kLogTextSize - 1)));
   return kWritten;
 }
 
 __attribute__((format(printf, 3, 0))) int LogFormatted(int priority, const char* tag,
                                                        const char* format, va_list arguments) {
   const ErrnoKeeper keeper;
-  char text[kTextSize] = "";
+  char text[kLogTextSize] = "";
   vsnprintf(text, sizeof(text), format, arguments);
   return Log(priority, tag, text);
 }

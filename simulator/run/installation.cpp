@@ -12,6 +12,7 @@
 #include <cstring>
 #include <filesystem>
 #include <map>
+#include <set>
 
 #include "apk/native_libraries.h"
 #include "simulator/package/android_manifest.h"
@@ -28,6 +29,7 @@ namespace fs = std::filesystem;
 
 // The ABIs of a phone, in the order in which its installer prefers them.
 constexpr const char* kPhoneAbis[] = {"arm64-v8a", "armeabi-v7a", "armeabi"};
+constexpr char kArm64Directory[] = "lib/arm64";
 
 // What goes where: the path below the package's directory, and the entry that it comes from.
 using Layout = std::map<std::string, std::string>;
@@ -153,17 +155,19 @@ bool LiesAlone(int package, const std::vector<std::string>& libraries) {
 Layout PlanLayout(const std::vector<std::string>& entries, InstalledAbi choice,
                   std::vector<std::string>* left_out, std::set<std::string>* of_other_processors) {
   Layout layout;
-  bool has_arm64 = false, has_arm = false;
-  for (const std::string abi : kPhoneAbis) {
-    const bool is_arm64 = abi == kPhoneAbis[0];
-    const bool is_wanted = !has_arm && Wants(choice, is_arm64, has_arm64);
-    bool* const has_this = is_arm64 ? &has_arm64 : &has_arm;
+  std::set<std::string> taken;  // the directories that have libraries
+  for (const char* const abi : kPhoneAbis) {
+    const std::string abi_directory = kLibraryNames.prefix + std::string(abi);
+    const std::string installed = ApkTools::InstalledLibraryPath("", abi_directory);
+    const bool has_arm64 = taken.count(kArm64Directory) != 0;
+    const bool is_wanted =
+        taken.count(installed) == 0 && Wants(choice, installed == kArm64Directory, has_arm64);
     for (const std::string& entry : entries) {
-      const bool is_of_abi = entry.rfind(kLibraryNames.prefix + abi + "/", 0) == 0;
+      const bool is_of_abi = entry.rfind(abi_directory + "/", 0) == 0;
       if (!is_of_abi || !IsNameForInstallers(entry)) continue;
       if (is_wanted) {
         layout.emplace(ApkTools::InstalledLibraryPath("", entry), entry);
-        *has_this = true;
+        taken.insert(installed);
       } else {
         of_other_processors->insert(entry);
       }

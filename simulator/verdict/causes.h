@@ -341,7 +341,7 @@ inline constexpr Cause kLibraryMissing = {"library-missing", Group::kLibrary, Se
     "Install the package again, unless the installer leaves it out on purpose."};
 inline constexpr Cause kLibraryOtherAbi = {"library-other-abi", Group::kLibrary, Severity::kNothing,
     ChainLink::kNone, "", "no phone of this kind installs it",
-    "Nothing: this tool knows arm64-v8a, armeabi-v7a and armeabi."};
+    "Nothing: the tool knows no directory for its ABI."};
 inline constexpr Cause kPackageRefused = {"package-refused", Group::kLibrary, Severity::kFollows,
     ChainLink::kNone, "`VeltSignJni: malformed apk`, `Apk archive is not valid`",
     "the package is refused", "Fix what the package is refused for; this follows."};

@@ -13,8 +13,7 @@ from sources import ROOT, report
 LATER = {
     "int memfd_create(const char*, unsigned);": ("memfd_create", 'memfd_create("", 0)'),
     "long getrandom(void*, unsigned long, unsigned);": ("getrandom", "getrandom(0, 0, 0)"),
-    "void* reallocarray(void*, unsigned long, unsigned long);": ("reallocarray",
-                                                                 "reallocarray(0, 1, 1) != 0"),
+    "void* reallocarray(void*, unsigned long, unsigned long);": ("reallocarray", "reallocarray(0, 1, 1) != 0"),
     "bool _ZNSt3__14__fs10filesystem8__statusERKNS1_4pathEPNS_10error_codeE(void*, void*);": (
         "std::__1::__fs::filesystem::__status",
         "_ZNSt3__14__fs10filesystem8__statusERKNS1_4pathEPNS_10error_codeE(0, 0)"),
@@ -26,8 +25,7 @@ OWN = "int Own() { return 1; }"
 def compiled(directory, name, text):
     source, built = directory / f"{name}.cpp", directory / f"{name}.o"
     source.write_text('extern "C" {\n' + text + "\n}\n")
-    subprocess.run(["clang++", "--target=aarch64-linux-android27", "-c", source, "-o", built],
-                   check=True)
+    subprocess.run(["clang++", "--target=aarch64-linux-android27", "-c", source, "-o", built], check=True)
     return built
 
 
@@ -54,7 +52,7 @@ def main():
                 problems.append(f"{symbol} is not noticed: {result.stdout}")
         if compare().returncode == 0:
             problems.append("no object at all is taken for good ones")
-    return report(problems)
+    return report(problems, "scripts/android: its function compare")
 
 
 if __name__ == "__main__":

@@ -70,7 +70,7 @@ def main():
         for files in ((), (directory / "missing",)):
             if check(*files).returncode == 0:
                 problems.append(f"{files} are taken for hardened files")
-    return report(problems)
+    return report(problems, "scripts/check-binary")
 
 
 if __name__ == "__main__":

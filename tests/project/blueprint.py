@@ -1,11 +1,9 @@
 #!/usr/bin/env python3
 """Reads Android.bp files: their modules, and how a platform's build compiles each source.
 
-blueprint.py FILE... prints a line for every source of these files: the module, the source, and the
-compiler's flags for it that the files give.
+blueprint.py FILE... prints for every source of these files its module, its path and the compiler's flags.
 """
 
-import pathlib
 import re
 import sys
 
@@ -69,9 +67,6 @@ class Blueprint:
         if len(found) != 1:
             sys.exit(f"{self.path}: {len(found)} modules are named {name}")
         return found[0]
-
-    def sources(self, name):
-        return sorted(sources(self.module(name)))
 
     def all_sources(self, kind):
         return [source for module in self.modules if module["type"] == kind

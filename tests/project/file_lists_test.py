@@ -1,7 +1,6 @@
 #!/usr/bin/env python3
-"""Compares the platform's build with CMake's: the file lists of both, also with the directories;
-the calls that the linker wraps for a test; and the words that a blueprint may use in Android
-8.1."""
+"""Writes the file lists of the platform's build from CMake's, and compares the rest of the two: the
+warnings, the functions that the linker wraps for a test, and the words that Android 8.1 knows."""
 
 import json
 import pathlib
@@ -43,56 +42,60 @@ KNOWN_PROPERTIES = {"cflags", "compile_multilib", "cpp_std", "data", "defaults",
 PLATFORM_ONLY_FLAGS = {"-Wno-sign-conversion", "-Werror"}
 
 
+# The modules whose sources are those of targets in CMake, by file. A blueprint names paths that count
+# from its own directory, which is that of the CMakeLists.txt for all but the programs of integration/.
+MODULES = {
+    "Android.bp": {"apktoolkit_core": ["apktoolkit_core"], "apktoolkit": ["apktoolkit"],
+                   "apktoolkit-verify": ["apktoolkit-verify"],
+                   "apktoolkit_verification": ["apktoolkit_verification"], "libzu": ["zu"],
+                   "apktoolkit-all": ["integration:apktoolkit-all", "integration:apktoolkit_caller"],
+                   "apktoolkit-bound": ["integration:apktoolkit-bound"]},
+    "tests/Android.bp": {"apktoolkit_test_support": ["tests/support:test_support"],
+                         **{f"apktoolkit_{room}_test": [f"tests/{room}:{room}_test"]
+                            for room in ROOMS if room != "verify"}},
+    "fuzz/cc_fuzz.bp": {"apktoolkit_fuzz_support": ["fuzz:fuzz_support"]},
+}
+# What a module has besides: CMake has these in libraries of their own.
+MORE = {"apktoolkit_sign_test": ["tests/support/phone.cpp"]}
+
+FIX = f"the lists and tables at the head of {__file__}, or the file that is named above"
+
+
 def main():
     problems = []
-    platform = Blueprint(ROOT / "Android.bp")
-    tests = Blueprint(ROOT / "tests/Android.bp")
-    fuzz = Blueprint(ROOT / "fuzz/cc_fuzz.bp")
-    hold_tool(platform, problems)
-    hold_tests(tests, fuzz, problems)
+    pages = {ROOT / name: with_sources(name, modules) for name, modules in MODULES.items()}
+    platform, tests, fuzz = (Blueprint(path) for path in pages)
+    compare("CMakeLists.txt and the tool's directories", map(str, tool_sources()),
+            sum(map(cmake_sources, ("apktoolkit_core", "apktoolkit", "apktoolkit-verify", "zu")), []), problems)
+    there = {str(path.relative_to(ROOT)) for path in ROOT.glob("fuzz/*_fuzz.cpp")}
+    compare("WORKSTATION_ONLY or fuzz/cc_fuzz.bp, and the files,", {*WORKSTATION_ONLY, *fuzz.all_sources("cc_fuzz")},
+            {"fuzz/quiet_log.cpp", *there, *(path for path in WORKSTATION_ONLY if (ROOT / path).exists())}, problems)
     hold_flags(platform, problems)
     hold_wraps(tests, problems)
     hold_words(platform, tests, problems)
-    return report(problems)
+    return report(problems, FIX, pages)
 
 
-def hold_tool(platform, problems):
-    core = cmake_sources("apktoolkit_core")
-    compare("apktoolkit_core", platform.sources("apktoolkit_core"), core, problems)
-    compare("apktoolkit_verification", platform.sources("apktoolkit_verification"),
-            cmake_sources("apktoolkit_verification"), problems)
-    compare("apktoolkit", platform.sources("apktoolkit"), cmake_sources("apktoolkit"), problems)
-    compare("apktoolkit-verify", platform.sources("apktoolkit-verify"),
-            cmake_sources("apktoolkit-verify"), problems)
-    compare("apktoolkit-all", platform.sources("apktoolkit-all"),
-            cmake_sources("apktoolkit-all", "integration") +
-            cmake_sources("apktoolkit_caller", "integration"), problems)
-    compare("apktoolkit-bound", platform.sources("apktoolkit-bound"),
-            cmake_sources("apktoolkit-bound", "integration"), problems)
-    compare("libzu", platform.sources("libzu"), cmake_sources("zu"), problems)
-    listed = core + cmake_sources("apktoolkit") + cmake_sources("apktoolkit-verify")
-    listed += cmake_sources("zu")
-    compare("the tool's directories", listed, map(str, tool_sources()), problems)
-
-
-def hold_tests(tests, fuzz, problems):
-    compare("apktoolkit_test_support", tests.sources("apktoolkit_test_support"),
-            cmake_sources("test_support", "tests/support"), problems)
-    compare("apktoolkit_fuzz_support", fuzz.sources("apktoolkit_fuzz_support"),
-            cmake_sources("fuzz_support", "fuzz"), problems)
-    both = [source for room in ROOMS for source in cmake_sources(f"{room}_test", f"tests/{room}")]
-    both += [str(path.relative_to(ROOT)) for path in (ROOT / "fuzz").glob("*_fuzz.cpp")]
-    on_phone = tests.all_sources("cc_test") + fuzz.all_sources("cc_fuzz")
-    shared = {"tests/support/phone.cpp", "fuzz/quiet_log.cpp"}
-    compare("tests and fuzz targets", set(on_phone) - shared | set(WORKSTATION_ONLY), both, problems)
-    problems += [f"{source} is in a module, and named as the workstation's own"
-                 for source in set(on_phone) & set(WORKSTATION_ONLY)]
+def with_sources(name, modules):
+    """The blueprint's text, with the sources of these modules as CMake has them."""
+    path = ROOT / name
+    text = path.read_text()
+    for module, targets in modules.items():
+        wanted = sum(map(cmake_sources, targets), MORE.get(module, []))
+        wanted = sorted(str((ROOT / source).relative_to(path.parent)) for source in wanted
+                        if source not in WORKSTATION_ONLY)
+        lines = "".join(f'        "{source}",\n' for source in wanted)
+        srcs = f"[\n{lines}    ]" if len(wanted) > 1 else f'["{wanted[0]}"]'
+        text, count = re.subn(rf'(name: "{module}",(?:(?!\n}}).)*?srcs: )\[[^]]*\]', rf"\g<1>{srcs}", text,
+                              flags=re.S)
+        if count != 1:
+            sys.exit(f"{path} has no module {module} with srcs: add one, with an empty list")
+    return text
 
 
 def hold_flags(platform, problems):
     settings = without_comments_of_cmake(ROOT / "cmake/CompilerSettings.cmake")
-    lists = re.findall(r"(?:add_compile_options|set)\((?:APKTOOLKIT_TOOL_OPTIONS )?(-[^)]*)\)",
-                       settings)
+    lists = re.findall(r"(?:add_compile_options|set)\((?:APKTOOLKIT_TOOL_OPTIONS )?(-[^)]*)\)", settings)
     warnings = {flag for text in lists for flag in text.split() if flag.startswith("-W")}
     flags = set(platform.module("apktoolkit_defaults")["cflags"])
     compare("warnings", flags ^ PLATFORM_ONLY_FLAGS, warnings, problems)
@@ -105,18 +108,13 @@ def hold_flags(platform, problems):
 def hold_wraps(tests, problems):
     wrapped = {}
     for path in sorted((ROOT / "tests").glob("*/CMakeLists.txt")):
-        for target, options in re.findall(r"target_link_options\((\w+) ([^)]*)\)",
-                                          without_comments_of_cmake(path)):
+        for target, options in re.findall(r"target_link_options\((\w+) ([^)]*)\)", without_comments_of_cmake(path)):
             wrapped[target] = re.findall(r"--wrap=(\w+)", options)
-    for module in tests.modules:
-        if module["type"] != "cc_test":
-            continue
+    for module in (module for module in tests.modules if module["type"] == "cc_test"):
         name = module["name"]
-        with_phone = "tests/support/phone.cpp" in tests.sources(name)
-        compare(f"what is wrapped for {name}",
-                re.findall(r"--wrap=(\w+)", str(module.get("ldflags"))),
-                wrapped.get("phone" if with_phone else name.replace("apktoolkit_", ""), []),
-                problems)
+        target = "phone" if name in MORE else name.replace("apktoolkit_", "")
+        compare(f"what is wrapped for {name}", re.findall(r"--wrap=(\w+)", str(module.get("ldflags"))),
+                wrapped.get(target, []), problems)
 
 
 def hold_words(platform, tests, problems):
@@ -131,14 +129,15 @@ def hold_words(platform, tests, problems):
             [path.parent.name for path in ROOT.glob("*/Android.bp")], problems)
 
 
-def cmake_sources(target, directory="."):
+def cmake_sources(target):
+    """The sources of a target, DIRECTORY:NAME, or NAME in the root."""
+    directory, _, name = target.rpartition(":")
     path = ROOT / directory / "CMakeLists.txt"
-    found = re.search(r"(?:add_library|add_executable|apktoolkit_add_test)\(%s\s+([^)]*)\)" % target,
+    found = re.search(rf"(?:add_library|add_executable|apktoolkit_add_test)\({name}\s+([^)]*)\)",
                       without_comments_of_cmake(path))
     if not found:
-        sys.exit(f"{path} has no target {target}")
-    return sorted(str(pathlib.Path(directory, word)) for word in found[1].split()
-                  if word.endswith(".cpp"))
+        sys.exit(f"{path} has no target {name}")
+    return sorted(str(pathlib.Path(directory, word)) for word in found[1].split() if word.endswith(".cpp"))
 
 
 def without_comments_of_cmake(path):

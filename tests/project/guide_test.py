@@ -1,21 +1,18 @@
 #!/usr/bin/env python3
-"""Runs the commands of docs/guide.md, and compares the page with their output.
+"""Runs what docs/guide.md shows, and writes what is printed.
 
-Arguments: the directory of the golden packages, and the words that start apktoolkit-sim. With
---write before them, the page is updated instead. A last line of three dots stands for the rest of
-the output. A command followed by three dots alone may print anything.
+Arguments: the directory of the golden packages, and the words that start apktoolkit-sim. A last line of
+three dots stands for the lines that follow; a command with nothing else may print anything.
 """
 
-import os
 import pathlib
 import re
 import shutil
-import subprocess
 import sys
 import tempfile
 import zipfile
 
-from sources import ROOT, path_with_simulator, report
+from sources import ROOT, Shell, report, shown_commands
 
 PAGE = ROOT / "docs/guide.md"
 DIRECTORY = "/data/app/vault"  # replaces the path of this test's directory on the page
@@ -47,29 +44,6 @@ def prepare(golden, directory):
         archive.writestr("a.txt", "a")
 
 
-def commands(block):
-    """The commands of one block, each with its output on the page."""
-    for part in re.split(r"^\$ ", block, flags=re.M)[1:]:
-        command, *expected = part.splitlines()
-        yield command, expected
-
-
-class Shell:
-    """A shell in the directory. A command finds the files and variables that earlier commands left."""
-
-    def __init__(self, directory, simulator):
-        self.directory = directory
-        self.path = path_with_simulator(directory, simulator)
-        self.status = 0
-
-    def run(self, command):
-        run = subprocess.run(["bash", "-c", f"(exit {self.status})\n{command}"], cwd=self.directory,
-                             env={**os.environ, "PATH": self.path, "LC_ALL": "C.UTF-8"},
-                             stdout=subprocess.PIPE, stderr=subprocess.STDOUT, text=True)
-        self.status = run.returncode
-        return run.stdout.replace(str(self.directory), DIRECTORY).splitlines()
-
-
 def settled(lines):
     text = "\n".join(lines)
     for pattern, replacement in VARIES:
@@ -77,25 +51,19 @@ def settled(lines):
     return text.splitlines()
 
 
-def check(block, shell):
-    """The problems of one block, and the block as it should be."""
-    problems, lines = [], []
-    for command, expected in commands(block):
-        printed = shell.run(command)
+def checked(block, shell):
+    """The block as it should be."""
+    lines = []
+    for command, expected in shown_commands(block):
+        shown = shell.run(command).stdout.replace(str(shell.directory), DIRECTORY).splitlines()
         if expected and expected[-1].strip() == "...":
-            shown = printed[:len(expected) - 1] + expected[-1:]
-        else:
-            shown = printed
-        if settled(shown) != settled(expected):
-            problems += [f"$ {command} prints:", *printed]
+            shown = shown[:len(expected) - 1] + expected[-1:]
         lines += [f"$ {command}", *(expected if settled(shown) == settled(expected) else shown)]
-    return problems, "\n".join(lines)
+    return "\n".join(lines)
 
 
 def main():
-    arguments = sys.argv[1:]
-    writes = arguments[0] == "--write"
-    golden, *simulator = arguments[1:] if writes else arguments
+    golden, *simulator = sys.argv[1:]
     page = PAGE.read_text()
     problems = [] if BLOCK.search(page) else ["docs/guide.md shows no command"]
     with tempfile.TemporaryDirectory() as name:
@@ -103,13 +71,8 @@ def main():
         prepare(pathlib.Path(golden), directory)
         shell = Shell(directory, simulator)
         for block in BLOCK.findall(page):
-            found, right = check(block, shell)
-            problems += found
-            page = page.replace(block, right, 1)
-    if writes:
-        PAGE.write_text(page)
-        return 0
-    return report(problems)
+            page = page.replace(block, checked(block, shell), 1)
+    return report(problems, PAGE, {PAGE: page})
 
 
 if __name__ == "__main__":

@@ -58,4 +58,4 @@ def jdk_problems():
 
 
 if __name__ == "__main__":
-    sys.exit(report(page_problems() + list(jdk_problems())))
+    sys.exit(report([*page_problems(), *jdk_problems()], "the command on the page that is named"))

@@ -5,7 +5,6 @@ examples/README.md shows, and compiles each installed header alone.
 Arguments: the build tree, the compiler, and the directory of a good package.
 """
 
-import concurrent.futures
 import os
 import pathlib
 import re
@@ -13,37 +12,20 @@ import shutil
 import subprocess
 import sys
 import tempfile
-import zipfile
 
-from sources import ROOT, report
+from sources import ROOT, changed_zip, report, shown_commands
 
 MARK = "== next command"
 
 
-def change_manifest(package, out):
-    """Copies the package, with one more attribute in its signed manifest."""
-    with zipfile.ZipFile(package) as source, zipfile.ZipFile(out, "w") as copy:
-        for name in source.namelist():
-            more = b"X: y\r\n" if name == "META-INF/MANIFEST.MF" else b""
-            copy.writestr(name, source.read(name) + more)
-
-
 def prepare(directory, build, package):
-    """Fills the page's directory: files of a checkout, the build tree, and the files that the page
-    names."""
+    """The page's directory: what a checkout has, the build tree, and the files that the page names."""
     shutil.copytree(ROOT / "examples", directory / "examples")
     (directory / "build").mkdir()
     (directory / "build/release").symlink_to(build)
     shutil.copy(package / "base.apk", directory)
-    change_manifest(package / "base.apk", directory / "changed.apk")
-
-
-def shown_commands(page):
-    """The page's commands, each with its output on the page; None stands for any output."""
-    for block in re.findall(r"^```\n(\$ .*?)\n```$", page, re.M | re.S):
-        for command in re.split(r"^\$ ", block, flags=re.M)[1:]:
-            command, *lines = command.splitlines()
-            yield command, None if lines == ["..."] else lines
+    changed_zip(package / "base.apk", lambda name, content: content + (b"X: y\r\n" if name.endswith(".MF") else b""),
+                directory / "changed.apk")
 
 
 def run(commands, directory, compiler):
@@ -59,32 +41,30 @@ def run(commands, directory, compiler):
 
 
 def page_problems(directory, compiler):
-    # The first command would make the build tree. The tested tree takes its place.
-    shown = list(shown_commands((ROOT / "examples/README.md").read_text()))[1:]
+    # The build tree that is tested is the one that the first command would make.
+    blocks = re.findall(r"^```\n(\$ .*?)\n```$", (ROOT / "examples/README.md").read_text(), re.M | re.S)
+    shown = [command for block in blocks for command in shown_commands(block)][1:]
     printed, problems = run([command for command, _ in shown], directory, compiler)
     for (command, expected), lines in zip(shown, printed):
-        if expected is not None and lines != expected:
+        if expected != ["..."] and lines != expected:
             problems += [f"{command} prints:", *lines]
     return problems
 
 
 def header_problems(directory, compiler):
     include = directory / "apktoolkit/include/apktoolkit"
-    environment = {**os.environ, "PKG_CONFIG_PATH": directory / "apktoolkit/lib/pkgconfig"}
-    flags = subprocess.run(["pkg-config", "--cflags", "apktoolkit"], env=environment, check=True,
+    flags = subprocess.run(["pkg-config", "--cflags", directory / "apktoolkit/lib/pkgconfig/apktoolkit.pc"], check=True,
                            capture_output=True, text=True).stdout.split()
 
-    def compile_alone(header):
-        name = header.relative_to(include)
-        result = subprocess.run(
-            [compiler, "-std=c++17", "-Wall", "-Wextra", "-Werror", *flags, "-fsyntax-only", "-x",
-             "c++", "-"], input=f'#include "{name}"\n', capture_output=True, text=True)
-        return [] if result.returncode == 0 else [f"{name} does not compile alone", result.stderr]
-
-    headers = sorted(include.rglob("*.h"))
-    with concurrent.futures.ThreadPoolExecutor(os.cpu_count()) as pool:
-        found = list(pool.map(compile_alone, headers))
-    return sum(found, [] if headers else ["no header is installed"])
+    sources = []
+    for header in include.rglob("*.h"):
+        sources.append(directory / f"alone{len(sources)}.cpp")
+        sources[-1].write_text(f'#include "{header.relative_to(include)}"\n')
+    result = subprocess.run([compiler, "-std=c++17", "-Wall", "-Wextra", "-Werror", *flags, "-fsyntax-only", *sources],
+                            capture_output=True, text=True)
+    if not sources:
+        return ["no header is installed"]
+    return [] if result.returncode == 0 else ["a header does not compile alone:", result.stderr]
 
 
 def main():
@@ -98,7 +78,7 @@ def main():
         prepare(directory, pathlib.Path(build), pathlib.Path(package))
         problems += page_problems(directory, compiler)
         problems += header_problems(directory, compiler)
-    return report(problems)
+    return report(problems, "examples/README.md, or cmake/Library.cmake, which installs the library")
 
 
 if __name__ == "__main__":

@@ -5,7 +5,6 @@ and runs the page's examples.
 Arguments: the directory of a good package, and the words that start apktoolkit-sim.
 """
 
-import os
 import pathlib
 import re
 import shutil
@@ -14,7 +13,7 @@ import sys
 import tempfile
 import zipfile
 
-from sources import ROOT, path_with_simulator, report
+from sources import ROOT, Shell, report
 
 
 def lint(page):
@@ -43,15 +42,13 @@ def run_examples(page, package, simulator):
         shutil.copytree(package, directory, dirs_exist_ok=True)
         with zipfile.ZipFile(directory / "library.jar", "w") as archive:
             archive.writestr("a.txt", "a")
-        path = path_with_simulator(directory, simulator)
-        count = 0
+        shell, count = Shell(directory, simulator), 0
         for example in examples(page):
-            run = subprocess.run(["bash", "-c", example], cwd=directory, capture_output=True, text=True,
-                                 env={**os.environ, "PATH": path})
+            shell.status = 0
+            run = shell.run(example, subprocess.PIPE)
             count += 1
             if run.returncode > 1 or run.stderr or not run.stdout:
-                problems += [f"$ {example}", f"ends with {run.returncode} and prints:",
-                             run.stdout + run.stderr]
+                problems += [f"$ {example}", f"ends with {run.returncode} and prints:", run.stdout + run.stderr]
     return problems if count else ["the page has no examples"]
 
 
@@ -69,7 +66,7 @@ def main():
         problems += [f"{option} is not in the {where}" for option in sorted(known - found)]
         problems += [f"{option} in the {where} is no option" for option in sorted(found - known)]
     problems += run_examples(page, package, simulator)
-    return report(problems)
+    return report(problems, "man/*.1 and simulator/apktoolkit-sim.bash; the options are those of simulator/options.cpp")
 
 
 if __name__ == "__main__":

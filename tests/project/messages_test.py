@@ -1,9 +1,9 @@
 #!/usr/bin/env python3
-"""Compares docs/messages.md with the sources, in both directions.
+"""Writes what docs/messages.md has from the sources: priority and files of each of the tool's messages,
+and the tables of the simulator's reasons. The codes in docs/journal.schema.json come from the same rows.
 
-Of the tool it compares each message's text, priority and file. Of the simulator it compares the
-texts that it understands in the tool's log, and the rows of its causes. The tables of reasons on
-the page and the codes in docs/journal.schema.json are made from these rows: --write updates both.
+By hand is what a message means. The test fails where a message has no entry, or an entry no message,
+and where the simulator looks for a text that the tool does not log.
 """
 
 import re
@@ -17,40 +17,36 @@ LITERALS = r'(?:"(?:[^"\\]|\\.)*"\s*)+'
 CALL = re.compile(r"\b(LogInfo|LogError|Fail)\(\s*(%s|k\w+)" % LITERALS)
 CONSTANT = re.compile(r"constexpr char (k\w+)\[\] =\s*(%s)" % LITERALS)
 
-# For each function: where it writes to, and its prefix to each text (Fail is crypto/pkcs7.cpp's).
+# The priority of what each function writes, and what it puts before each text. Fail is
+# crypto/pkcs7.cpp's, and writes to standard output.
 WRITERS = {
     "LogInfo": ("Info", ""),
     "LogError": ("Error", ""),
-    "Fail": ("Standard output", "CERT_PARCER [ERROR]: "),
+    "Fail": ("", "CERT_PARCER [ERROR]: "),
 }
 
-# An entry of the page: "### `text`", then a paragraph that opens with "Error, `file`, `file`."
-ENTRY = re.compile(
-    r"^### `(?P<text>.*)`\n\n((?P<priority>Info|Error), )?(?P<files>`[^`]+`(, `[^`]+`)*)\.\s", re.M)
+# An entry of the page: "### `text`", then a paragraph that opens with its priority and its files, as in
+# "Error, `file`, `file`." These two words and lists come from the sources.
+ENTRY = re.compile(r"^### `(.*)`\n\n((?:(?:Info|Error), )?`[^`]+`(?:,\s`[^`]+`)*\.\s)?", re.M)
 
 
 def joined(literals):
     return "".join(re.findall(r'"((?:[^"\\]|\\.)*)"', literals))
 
 
-def written():
-    found = set()
+def messages():
+    """For each text that the tool writes, how its entry opens."""
+    found = {}
     for path in tool_sources():
         source = without_comments((ROOT / path).read_text())
         constants = dict(CONSTANT.findall(source))
         for function, argument in CALL.findall(source):
             writer, prefix = WRITERS[function]
-            found.add((prefix + joined(constants.get(argument, argument)), writer, str(path)))
-    return found
-
-
-def documented():
-    text = (ROOT / "docs/messages.md").read_text()
-    entries = list(ENTRY.finditer(text))
-    if len(entries) != text.count("\n### "):
-        sys.exit("docs/messages.md: an entry does not open with its priority and its files")
-    return {(entry["text"], entry["priority"] or "Standard output", path)
-            for entry in entries for path in re.findall(r"`([^`]+)`", entry["files"])}
+            text = prefix + joined(constants.get(argument, argument))
+            found.setdefault(text, set()).add((writer, f"`{path}`"))
+    return {text: ", ".join([*dict.fromkeys(filter(None, (writer for writer, _ in sorted(places)))),
+                             *(path for _, path in sorted(places))]) + "."
+            for text, places in found.items()}
 
 
 # A row of the simulator's table of causes.
@@ -156,24 +152,23 @@ def library_problems(messages):
     return problems
 
 
+FIX = f"""an entry of {PAGE} is "### `TEXT`", an empty line, and what the message means;
+messages_test.py --write adds its priority and its files. The texts that the simulator looks for are in
+{LOG_LINES}, its reasons in {CAUSES}."""
+
+
 def main():
-    rows = causes()
-    page, schema = PAGE.read_text(), SCHEMA.read_text()
-    right_page = REASONS.sub(lambda _: tables(rows), page)
-    right_schema = CODES.sub(lambda match: match[1] + codes(rows), schema)
-    if sys.argv[1:] == ["--write"]:
-        PAGE.write_text(right_page)
-        SCHEMA.write_text(right_schema)
-        return 0
-    in_sources, in_page = written(), documented()
-    messages = {text for text, _, _ in in_sources}
-    problems = [f"not in docs/messages.md: {entry}" for entry in sorted(in_sources - in_page)]
-    problems += [f"not in the sources: {entry}" for entry in sorted(in_page - in_sources)]
-    problems += log_problems(messages) + reasons_problems(rows, messages) + library_problems(messages)
-    problems += [f"{path} is not as tests/project/messages_test.py --write makes it"
-                 for path, is_right in ((PAGE, page == right_page), (SCHEMA, schema == right_schema))
-                 if not is_right]
-    return report(problems)
+    rows, texts = causes(), messages()
+    page = PAGE.read_text()
+    entries = [entry[1] for entry in ENTRY.finditer(page)]
+    problems = [f"{PAGE} has no entry for this message: {text}" for text in texts if text not in entries]
+    problems += [f"nothing writes this message: {text}" for text in entries if text not in texts]
+    problems += log_problems(texts) + reasons_problems(rows, texts) + library_problems(texts)
+    page = ENTRY.sub(lambda entry: entry[0] if entry[1] not in texts else
+                     f"### `{entry[1]}`\n\n{texts[entry[1]]}{(entry[2] or ' ')[-1]}", page)
+    page = REASONS.sub(lambda _: tables(rows), page)
+    schema = CODES.sub(lambda match: match[1] + codes(rows), SCHEMA.read_text())
+    return report(problems, FIX, {PAGE: page, SCHEMA: schema})
 
 
 if __name__ == "__main__":

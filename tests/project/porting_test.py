@@ -1,7 +1,7 @@
 #!/usr/bin/env python3
-"""Compares docs/porting.md with the project: the interface in the sources, the modules of the
-blueprint, the example of a JAR's key block, and the files of integration/, which it must all
-name."""
+"""Compares docs/porting.md with the sources: the interface, the modules of the blueprint, the example of a
+JAR's key block, and the directories of integration/, each of which it must link. Writes from the sources
+where libraries lie on disk, there and on the tool's manual page."""
 
 import hashlib
 import re
@@ -11,31 +11,29 @@ import sys
 from blueprint import Blueprint
 from sources import ROOT, report
 
-PAGE = (ROOT / "docs/porting.md").read_text()
+PATH = ROOT / "docs/porting.md"
+PAGE = PATH.read_text()
+MANUAL = ROOT / "man/apktoolkit.1"
 
 
 def section(title):
     return re.search(rf"^#+ {re.escape(title)}\n(.*?)(?=^#)", PAGE, re.M | re.S)[1]
 
 
+# A fact in the sources, and how the page says it.
+INTERFACE = (
+    ("sign/integrity.cpp", r"kSignCommand = (\d+);", "### fcntl(fd, {}, payload): sign\n"),
+    ("sign/integrity.cpp", r"kVerifyCommand = (\d+);", "### fcntl(fd, {}): verify\n"),
+    ("sign/integrity.cpp", r'"(/proc/self/[^"]+)"', "`{}`"),
+    ("sign/integrity.cpp", r"kPollMicroseconds = (\d+)000;", "every {} ms"),
+    ("sign/libzu.h", r"result == (0x\w+)", "({})"),
+    ("sign/libzu.h", r'(extern "C" int ZuNewCertificate\([^)]*\);)', "\n    {}\n"))
+
+
 def interface_problems():
-    """Numbers and names are those of the sources."""
-    integrity = (ROOT / "sign/integrity.cpp").read_text()
-    libzu = (ROOT / "sign/libzu.h").read_text()
-    wanted = []
-    for constant, heading in (("kSignCommand", "fcntl(fd, {}, payload): sign"),
-                              ("kVerifyCommand", "fcntl(fd, {}): verify")):
-        number = re.search(constant + r" = (\d+);", integrity)[1]
-        wanted.append(f"### {heading.format(number)}\n")
-    for path in re.findall(r'"(/proc/self/[^"]+)"', integrity):
-        wanted.append(f"`{path}`")
-    milliseconds = int(re.search(r"kPollMicroseconds = (\d+);", integrity)[1]) // 1000
-    wanted.append(f"every {milliseconds} ms")
-    success = re.search(r"result == (0x\w+)", libzu)[1]
-    wanted.append(f"{int(success, 16)} ({success})")
-    declaration = re.search(r'(extern "C" int ZuNewCertificate\([^)]*\);)', libzu)[1]
-    wanted.append(f"\n    {declaration}\n")
-    return [f"docs/porting.md does not say {text!r}" for text in wanted if text not in PAGE]
+    facts = ((path, text, re.search(pattern, (ROOT / path).read_text())) for path, pattern, text in INTERFACE)
+    return [f"docs/porting.md does not say {text!r} as {path} has it: {fact and fact[0]}"
+            for path, text, fact in facts if not fact or text.format(fact[1]) not in PAGE]
 
 
 def key_block_problems():
@@ -59,15 +57,11 @@ def module_problems():
 
 
 def link_problems():
-    """Every linked file exists, and every file of integration/ is named."""
-    problems = []
-    for link in re.findall(r"\]\(([^)#]+)(?:#[^)]*)?\)", PAGE):
-        if not (ROOT / "docs" / link).exists():
-            problems.append(f"docs/porting.md links {link}, which is not there")
+    """Its own headings are there, and of integration/ nothing is left unnamed."""
     headings = {re.sub(r"[^\w\- ]", "", title.lower()).replace(" ", "-")
                 for title in re.findall(r"^#+ (.*)$", PAGE, re.M)}
-    problems += [f"docs/porting.md has no heading #{anchor}"
-                 for anchor in re.findall(r"\]\(#([^)]+)\)", PAGE) if anchor not in headings]
+    problems = [f"docs/porting.md has no heading #{anchor}"
+                for anchor in re.findall(r"\]\(#([^)]+)\)", PAGE) if anchor not in headings]
     files = subprocess.run(["git", "ls-files", "integration"], cwd=ROOT, text=True, check=True,
                            stdout=subprocess.PIPE).stdout.split()
     rooms = {path.split("/")[1] for path in files if path.count("/") > 1}
@@ -75,5 +69,23 @@ def link_problems():
                        if f"../integration/{room}" not in PAGE]
 
 
+def with_library_directories():
+    """Both pages, with the directories of apk/native_libraries.h."""
+    installed = {}
+    for entry, directory in re.findall(r'\{"(lib/[^"]+)", "(lib/[^"]+)"\}',
+                                       (ROOT / "apk/native_libraries.h").read_text()):
+        installed.setdefault(directory, []).append(entry)
+    rows = "".join(f"| {', '.join(f'`{entry}/`' for entry in entries)} | `{directory}/` |\n"
+                   for directory, entries in installed.items())
+    items = "".join(f".It Pa {directory}\nBeside a package: its extracted libraries, those of\n"
+                    + "\nand\n".join(f".Pa {entry}" for entry in entries) + " .\n"
+                    for directory, entries in installed.items())
+    head = "| Entries of the package | Files beside the package |\n|---|---|\n"
+    return {PATH: re.sub(rf"(?<={re.escape(head)})(\|.*\n)*", lambda _: rows, PAGE),
+            MANUAL: re.sub(r"(?<=^\.Sh FILES\n\.Bl -tag -width Ds\n)(?:(?:\.It Pa lib/|[^.]|\.Pa ).*\n)*",
+                           lambda _: items, MANUAL.read_text(), flags=re.M)}
+
+
 if __name__ == "__main__":
-    sys.exit(report(interface_problems() + key_block_problems() + module_problems() + link_problems()))
+    sys.exit(report(interface_problems() + key_block_problems() + module_problems() + link_problems(),
+                    f"{PATH}: write there what the sources have now", with_library_directories()))

@@ -34,7 +34,7 @@ def main():
     problems = [] if run.returncode == 0 else [f"scripts/demo ends with {run.returncode}", run.stderr]
     if not re.fullmatch(pattern(shown), settled(run.stdout)):
         problems += ["scripts/demo prints:", run.stdout]
-    return report(problems)
+    return report(problems, "the block `$ scripts/demo` in README.md, by hand")
 
 
 if __name__ == "__main__":

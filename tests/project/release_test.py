@@ -1,6 +1,7 @@
 #!/usr/bin/env python3
-"""Compares debian/changelog with CHANGES.md. Runs scripts/release in a repository with good and bad
-tags; stand-ins install nothing and build empty packages. Argument: the version of the build."""
+"""Writes debian/changelog from CHANGES.md, and has scripts/release make releases of a repository with good
+and bad tags, in which stand-ins install nothing and build empty packages. Argument: the build's version.
+"""
 
 import os
 import pathlib
@@ -21,9 +22,6 @@ def version_problems(version):
     newest = re.search(r"^## (\S+),", (ROOT / "CHANGES.md").read_text(), re.M)[1]
     if newest != version:
         yield f"CHANGES.md is of {newest}, and {version} is built"
-    wanted = subprocess.run([ROOT / "scripts/changelog"], capture_output=True, text=True, check=True)
-    if (ROOT / "debian/changelog").read_text() != wanted.stdout:
-        yield "debian/changelog is not what scripts/changelog prints"
 
 
 class Repository:
@@ -116,7 +114,8 @@ def main():
         problems += refusal_problems(repository)
         problems += release_problems(repository)
         repository.run("gpgconf", "--kill", "all")
-    return report(problems)
+    changelog = subprocess.run([ROOT / "scripts/changelog"], capture_output=True, text=True, check=True).stdout
+    return report(problems, "scripts/release, or CHANGES.md", {ROOT / "debian/changelog": changelog})
 
 
 if __name__ == "__main__":

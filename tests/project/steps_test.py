@@ -1,7 +1,8 @@
 #!/usr/bin/env python3
-"""Compares the steps of scripts/check with the docs, and runs scripts/check with steps that pass,
-fail and skip."""
+"""Writes the table of steps in docs/testing.md from scripts/check, and has scripts/check run steps that
+pass, fail and skip."""
 
+import contextlib
 import os
 import pathlib
 import re
@@ -13,13 +14,27 @@ import tempfile
 from sources import ROOT, report
 
 
+PAGE = ROOT / "docs/testing.md"
+FIX = "the table at the head of scripts/check, a function below it, and groups_of in scripts/setup"
+
+
 def listed_steps():
+    """Each step of scripts/check, with what its table says of it."""
     table = re.search(r"^steps='\n(.*?)\n'$", (ROOT / "scripts/check").read_text(), re.M | re.S)
-    return [line.split()[0] for line in table[1].splitlines()]
+    return dict(line.split(maxsplit=1) for line in table[1].splitlines())
 
 
 def everyday_steps():
     return re.search(r"/check\" (.*)", (ROOT / "scripts/test").read_text())[1].split()
+
+
+def page_with_steps():
+    """docs/testing.md, with its table as scripts/check has it."""
+    everyday = everyday_steps()
+    rows = "".join(f"| `{step}`{' *' if step in everyday else ''} | {text} |\n"
+                   for step, text in listed_steps().items())
+    return re.sub(r"(?<=^\| Step \| What it does \|\n\|---\|---\|\n)(\|.*\n)*", lambda _: rows, PAGE.read_text(),
+                  flags=re.M)
 
 
 def part(path, beginning, end):
@@ -45,25 +60,26 @@ def setup_problems():
 
 
 def list_problems():
-    """Every step has a function, and the docs name the steps in the same order."""
-    steps, everyday = listed_steps(), everyday_steps()
+    """Every step is a function, in the same order, and README.md shows the everyday ones."""
     functions = re.findall(r"^step_(\w+)\(\)", (ROOT / "scripts/check").read_text(), re.M)
-    page = part("docs/testing.md", "## Steps", "## .*")
-    shown = part("README.md", r"\$ scripts/test", "```")
-    problems = []
-    for what, found, expected in (
-            ("functions", functions, steps),
-            ("docs/testing.md", re.findall(r"^\| `(\w+)`", page, re.M), steps),
-            ("docs/testing.md, with a star", re.findall(r"^\| `(\w+)` \*", page, re.M), everyday),
-            ("README.md", re.findall(r"^([a-z]\w+) .*build/logs", shown, re.M), everyday)):
-        if found != expected:
-            problems.append(f"{what}: {found} in place of {expected}")
-    return problems
+    shown = re.findall(r"^([a-z]\w+) .*build/logs", part("README.md", r"\$ scripts/test", "```"), re.M)
+    return [f"{what}: {found} in place of {expected}"
+            for what, found, expected in (("functions of scripts/check", functions, list(listed_steps())),
+                                          ("README.md", shown, everyday_steps())) if found != expected]
 
 
 def check(directory, *steps):
     run = subprocess.run([directory / "scripts/check", *steps], capture_output=True, text=True)
     return re.sub(r"\(\d+ s, ", "(N s, ", run.stdout).splitlines(), run.returncode
+
+
+@contextlib.contextmanager
+def scripts(name):
+    """A directory with a copy of this script alone."""
+    with tempfile.TemporaryDirectory() as directory:
+        (pathlib.Path(directory) / "scripts").mkdir()
+        shutil.copy(ROOT / "scripts" / name, pathlib.Path(directory) / "scripts")
+        yield pathlib.Path(directory)
 
 
 def write(path, content):
@@ -72,11 +88,8 @@ def write(path, content):
 
 
 def run_problems():
-    """scripts/check reports every way in which a step can end."""
-    with tempfile.TemporaryDirectory() as name:
-        directory = pathlib.Path(name)
-        (directory / "scripts").mkdir()
-        shutil.copy(ROOT / "scripts/check", directory / "scripts")
+    """What scripts/check makes of steps that end in every way."""
+    with scripts("check") as directory:
         write(directory / "scripts/setup", "true")
         write(directory / "scripts/check-arrows", "echo arrow; echo all 3 are allowed")
         write(directory / "scripts/format", "echo bad.cpp; exit 1")
@@ -85,68 +98,44 @@ def run_problems():
             [[ $1 == release ]] || echo "FAILED A.C: one"
             echo "1 passed"
             [[ $1 == release ]]""")
-        found = check(directory, "arrows", "release", "format", "sanitize")
-        expected = (["arrows        all 3 are allowed (N s, build/logs/arrows.log)",
-                     "release       1 passed (N s, build/logs/release.log)",
-                     "    skipped A.B: no kernel",
-                     "format        FAILED (N s, build/logs/format.log)",
-                     "    bad.cpp",
-                     "sanitize      FAILED (N s, build/logs/sanitize.log)",
-                     "    skipped A.B: no kernel",
-                     "    FAILED A.C: one",
-                     "    1 passed",
-                     "steps: 2 passed, 2 failed, 0 skipped"], 1)
-        problems = [] if found == expected else [f"scripts/check ends with {found}"]
-        if (found := check(directory, "arrows"))[1] != 0:
-            problems.append(f"scripts/check does not pass: {found}")
-        if (found := check(directory, "arrow"))[1] != 2:
-            problems.append(f"scripts/check takes a step that there is not: {found}")
         write(directory / "scripts/bare-system", "echo on its way; echo skipped: no root; exit 77")
-        skipped = ["debian13      skipped: no root (N s, build/logs/debian13.log)"]
-        found = check(directory, "debian13", "arrows")
-        if found != (skipped + expected[0][:1] + ["steps: 1 passed, 0 failed, 1 skipped"], 0):
-            problems.append(f"scripts/check takes a skipped step for another: {found}")
-        found = check(directory, "debian13")
-        if found != (skipped + ["steps: 0 passed, 0 failed, 1 skipped"], 1):
-            problems.append(f"scripts/check passes where no step ran: {found}")
+        arrows = "arrows        all 3 are allowed (N s, build/logs/arrows.log)"
+        skipped = "debian13      skipped: no root (N s, build/logs/debian13.log)"
+        for steps, printed, status in (
+                ("arrows release format sanitize",
+                 [arrows, "release       1 passed (N s, build/logs/release.log)", "    skipped A.B: no kernel",
+                  "format        FAILED (N s, build/logs/format.log)", "    bad.cpp",
+                  "sanitize      FAILED (N s, build/logs/sanitize.log)", "    skipped A.B: no kernel",
+                  "    FAILED A.C: one", "    1 passed", "steps: 2 passed, 2 failed, 0 skipped"], 1),
+                ("arrows", [arrows, "steps: 1 passed, 0 failed, 0 skipped"], 0),
+                ("arrow", [], 2),
+                ("debian13 arrows", [skipped, arrows, "steps: 1 passed, 0 failed, 1 skipped"], 0),
+                ("debian13", [skipped, "steps: 0 passed, 0 failed, 1 skipped"], 1)):
+            if (found := check(directory, *steps.split())) != (printed, status):
+                yield f"scripts/check {steps} ends with {found}"
         write(directory / "scripts/setup", "exit 1")
         if (found := check(directory, "arrows"))[1] == 0:
-            problems.append(f"scripts/check goes on without its packages: {found}")
-    return problems
-
-
-def emulator_problems():
-    """Without an emulator scripts/kernel is a skipped step."""
-    with tempfile.TemporaryDirectory() as name:
-        directory = pathlib.Path(name)
-        (directory / "scripts").mkdir()
-        shutil.copy(ROOT / "scripts/kernel", directory / "scripts")
-        write(directory / "scripts/setup", "[[ $1 != emulator ]]")
-        run = subprocess.run([directory / "scripts/kernel"], capture_output=True, text=True)
-        expected = (77, "skipped: qemu is missing, and apt-get cannot install it\n")
-        found = (run.returncode, run.stdout)
-        return [] if found == expected else [f"scripts/kernel without qemu ends with {found}"]
+            yield f"scripts/check goes on without its packages: {found}"
 
 
 def skip_problems():
-    """scripts/bare-system prints why it cannot run here, and its status marks the step as skipped."""
-    with tempfile.TemporaryDirectory() as name:
-        directory = pathlib.Path(name)
-        (directory / "scripts").mkdir()
-        shutil.copy(ROOT / "scripts/bare-system", directory / "scripts")
-        write(directory / "wget", "exit 4")
-        reasons = [("exit 1", "debootstrap is missing, and apt-get cannot install it"),
-                   ("true", "http://mirror.invalid/debian/dists/trixie/Release cannot be fetched")]
-        for setup, reason in reasons:
+    """scripts/kernel and scripts/bare-system say why they cannot run here, and by their status that they did not."""
+    needs_root = "only root can make a bare system"
+    for script, setup, reason in (
+            ("kernel", "[[ $1 != emulator ]]", "qemu is missing, and apt-get cannot install it"),
+            ("bare-system 13", "exit 1", "debootstrap is missing, and apt-get cannot install it"),
+            ("bare-system 13", "true", "http://mirror.invalid/debian/dists/trixie/Release cannot be fetched")):
+        with scripts(script.split()[0]) as directory:
+            write(directory / "wget", "exit 4")
             write(directory / "scripts/setup", setup)
-            expected = reason if os.geteuid() == 0 else "only root can make a bare system"
-            run = subprocess.run([directory / "scripts/bare-system", "13"], capture_output=True, text=True,
+            expected = needs_root if script != "kernel" and os.geteuid() != 0 else reason
+            run = subprocess.run(["bash", "-c", f"scripts/{script}"], cwd=directory, capture_output=True, text=True,
                                  env={**os.environ, "PATH": f"{directory}:{os.environ['PATH']}",
                                       "DEBIAN_MIRROR": "http://mirror.invalid/debian"}, check=False)
-            if (run.returncode, run.stdout) != (77, f"skipped: {expected}\n"):
-                yield f"scripts/bare-system ends with {run.returncode}: {run.stdout}{run.stderr}"
+        if (run.returncode, run.stdout) != (77, f"skipped: {expected}\n"):
+            yield f"scripts/{script} ends with {run.returncode}: {run.stdout}{run.stderr}"
 
 
 if __name__ == "__main__":
-    sys.exit(report(list_problems() + setup_problems() + run_problems() + emulator_problems() +
-                    list(skip_problems())))
+    sys.exit(report([*list_problems(), *setup_problems(), *run_problems(), *skip_problems()],
+                    FIX, {PAGE: page_with_steps()}))

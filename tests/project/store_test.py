@@ -16,7 +16,7 @@ import sys
 import tempfile
 import time
 
-from sources import ROOT, path_with_simulator, report
+from sources import ROOT, Shell, report
 
 PAGE = ROOT / "docs/store.md"
 BLOCK = re.compile(r"^```\n(\$ .*?)\n```$", re.M | re.S)
@@ -55,11 +55,12 @@ def prepare(golden, directory):
     return {verdict: count for _, verdict, count in PACKAGES}
 
 
-class Shell:
+class Store(Shell):
+    """Its commands can be killed, and leave their journals in its directory."""
+
     def __init__(self, directory, simulator):
-        self.directory = directory
-        self.environment = {**os.environ, "LC_ALL": "C.UTF-8", "HOME": str(directory),
-                            "PATH": path_with_simulator(directory, simulator)}
+        super().__init__(directory, simulator)
+        self.environment["HOME"] = str(directory)
 
     def start(self, command):
         return subprocess.Popen(["bash", "-c", command], cwd=self.directory, env=self.environment,
@@ -105,7 +106,7 @@ def run_and_kill(shell, command):
 
 
 def check(directory, simulator, expected):
-    shell = Shell(directory, simulator)
+    shell = Store(directory, simulator)
     problems, printed = [], {}
     for command in commands():
         if command.startswith("ls batches | parallel "):

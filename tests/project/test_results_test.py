@@ -37,9 +37,8 @@ CASES = [  # the output of ctest, the expected lines, the exit status
     ([PASSED, FAILED], ["FAILED A.Bad: a_test.cpp:9: Failure", "    Which is: 256",
                         "1 passed, 1 failed, 0 skipped"], 1),
     ([PASSED, TIMEOUT], ["FAILED A.Slow: Timeout", "1 passed, 1 failed, 0 skipped"], 1),
-    ([PASSED, NOT_BUILT], ["FAILED A.Absent: Unable to find executable",
-                           "1 passed, 1 failed, 0 skipped"], 1),
-    # A run without any test that ran is a failure.
+    ([PASSED, NOT_BUILT], ["FAILED A.Absent: Unable to find executable", "1 passed, 1 failed, 0 skipped"], 1),
+    # Nothing that was run is nothing that passed.
     ([SKIPPED], ["skipped A.Skipped: no such kernel", "0 passed, 0 failed, 1 skipped"], 1),
     ([], ["0 passed, 0 failed, 0 skipped"], 1),
 ]
@@ -51,12 +50,10 @@ def main():
         with tempfile.NamedTemporaryFile("w", suffix=".xml") as results:
             results.write(f"<testsuite>{''.join(cases)}</testsuite>")
             results.flush()
-            run = subprocess.run([ROOT / "scripts/test-results", results.name],
-                                 capture_output=True, text=True)
+            run = subprocess.run([ROOT / "scripts/test-results", results.name], capture_output=True, text=True)
         if (run.stdout.splitlines(), run.returncode) != (expected, status):
-            problems += [f"in place of {expected} and {status}: {run.returncode}",
-                         run.stdout, run.stderr]
-    return report(problems)
+            problems += [f"in place of {expected} and {status}: {run.returncode}", run.stdout, run.stderr]
+    return report(problems, "scripts/test-results")
 
 
 if __name__ == "__main__":

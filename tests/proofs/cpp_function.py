@@ -3,9 +3,28 @@
 A function's statements are translated into Python's, which for the arithmetic that is proved here
 read almost alike. A value may be a Word: a term of z3's that stands for every value of its type; a
 comparison of such a value splits the run into one for each answer that is possible.
+
+The dialect. A function that is read here has these forms and no others:
+
+  declaration  const TYPE name = value;  TYPE name = value;  TYPE name;  TYPE name[n], name[n];
+               TYPE is uint32_t, uint64_t, int, bool, auto or lanes, perhaps with *. A narrower type
+               would cut its value, which no proof would see. `constexpr` goes as `const` does, and a
+               typedef is passed over.
+  statement    name = value;  also with += -= |= <<= >>=, to name, *name, name[i] or name->name;
+               ++name;  --name;  memcpy(&to, from, sizeof(to));  continue;  break;  return value;  a call.
+  block        if (condition) and for (one; two; three), with a block or one statement. No else,
+               while, switch or ?:.
+  value        + - * / % << >> & | with a blank on both sides; comparisons, && || !; numbers, 'c',
+               true, false; *name, &name in a call, name[i], name->name, calls; static_cast to one of
+               the types above. A Word has + - * / << >> & | < and ==.
+
+Constants of the file that are made of numbers are known, all others are given to load(). Comments and
+lines of the preprocessor are passed over. Anything else ends the proof with an Unread, which names the
+line. Then write that line in the dialect, or add its form here, to the list and to the translation.
 """
 import pathlib
 import re
+import traceback
 
 import z3
 
@@ -134,6 +153,15 @@ class Pointer:
         self.values[index] = value
 
 
+class Unread(Exception):
+    """A line of the sources that is not in the dialect."""
+
+    def __init__(self, path, line, why):
+        text = (ROOT / path).read_text().splitlines()[line - 1].strip()
+        super().__init__(f"{path}:{line}: `{text}` is not in the dialect that tests/proofs/cpp_function.py "
+                         f"describes ({why}). Write the line in it, or add its form there.")
+
+
 def code(path):
     """The source file without its comments and preprocessor lines."""
     return re.sub(r"//[^\n]*|^#[^\n]*", "", (ROOT / path).read_text(), flags=re.M)
@@ -151,29 +179,49 @@ def load(path, name, **constants):
             pass  # its values are not only numbers
     found = re.search(r"^(?!\s)[^\n;{}]*?\b%s\(([^;{}]*)\) \{\n(.*?)^\}" % name, text, re.S | re.M)
     if not found:
-        raise AssertionError(f"{path} has no function {name}")
+        raise AssertionError(f"{path} has no function {name}: tell tests/proofs/prove.py its new name or file")
     parameters = [re.search(r"(\w+)$", word.strip())[1] for word in found[1].split(",")]
-    lines = [f"def function({', '.join(parameters)}):"] + statements(found[2])
-    exec("\n".join(lines), scope)
-    return scope["function"]
+    first = text[:found.start(2)].count("\n") + 1
+    lines, places = [f"def function({', '.join(parameters)}):"], [first - 1]
+    for place, line in statements(found[2], path, first):
+        lines.append(line)
+        places.append(place)
+    name = f"{path}, {name}"
+    try:
+        exec(compile("\n".join(lines), name, "exec"), scope)
+    except SyntaxError as error:
+        raise Unread(path, places[error.lineno - 1], error) from error
+
+    def run(*arguments):
+        try:
+            return scope["function"](*arguments)
+        except (ArithmeticError, AttributeError, LookupError, NameError, TypeError, z3.Z3Exception) as error:
+            steps = traceback.extract_tb(error.__traceback__)
+            inside = [step.lineno for step in steps if step.filename == name]
+            raise Unread(path, places[inside[-1] - 1], error) from error
+
+    return run
 
 
-TYPE = r"(?:const )?(?:uint\d+_t|int|bool|lanes)\b ?\*?"
+TYPE_NAME = r"(?:uint32_t|uint64_t|int|bool|auto|lanes)"
+TYPE = rf"(?:const )?{TYPE_NAME}\b ?\*?"
 
 
-def statements(body):
-    """The lines of a function's body in Python. Each block indents them by one more space."""
+def statements(body, path, first):
+    """The lines of a function's body in Python, each of which is indented by one space a block; before
+    each the number of its line in the source file, where the body begins with the line `first`."""
     body = re.sub(r"\bif \((.*)\) (\w[^{;]*;)", r"if (\1) {\2}", body)
     body = re.sub(r"\b(for \(.*?;.*?;.*?\)) ([\w*][^{;]*;)", r"\1 {\2}", body)
-    steps, lines = [], []
+    steps = []
     token = re.compile(r"\s*(for \(.*?;.*?;.*?\) \{|if \(.*?\) \{|\}|[^;{}]+;)", re.S)
     position, end = 0, len(body.rstrip())
     while position < end:
         match = token.match(body, position)
+        place = first + body[:match.start(1) if match else position + 1].count("\n")
         if not match:
-            raise AssertionError(f"cannot read: {body[position:position + 60]!r}")
+            raise Unread(path, place, "no statement is found here")
         position = match.end()
-        text = " ".join(match[1].split())
+        text, lines = " ".join(match[1].split()), []
         depth = " " * (len(steps) + 1)
         if text.startswith("for ("):
             start, condition, step = text[len("for ("):-len(") {")].split("; ")
@@ -190,7 +238,7 @@ def statements(body):
             lines += [depth + next(s for s in reversed(steps) if s), depth + "continue"]
         else:
             lines.append(depth + simple(text[:-1]))
-    return lines
+        yield from ((place, line) for line in lines)
 
 
 def simple(text):
@@ -214,9 +262,9 @@ def simple(text):
 
 
 def expression(text):
-    text = re.sub(r"static_cast<[^<>]*>", "", text)
-    text = re.sub(r"(?<![\w)\]] )(?<![\w)\]])\*(\w+)", r"\1[0]", text)  # the value that a pointer points at
-    text = re.sub(r"&(\w+)(?=[,)\[])", r"\1", text)  # an address that is passed to a call
+    text = re.sub(rf"static_cast<{TYPE_NAME}>", "", text)
+    text = re.sub(r"(?<![\w)\]] )(?<![\w)\]])\*(\w+)", r"\1[0]", text)  # what a pointer points at
+    text = re.sub(r"&(\w+)(?=[,)\[])", r"\1", text)  # an address that a call is given
     for cpp, python in (("->", "."), ("std::", ""), ("&&", " and "), ("||", " or "),
                         (" / ", " // "), ("false", "False"), ("true", "True")):
         text = text.replace(cpp, python)

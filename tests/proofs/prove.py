@@ -3,10 +3,11 @@
 functions from the sources. Fails if a claim does not hold."""
 import re
 import sys
+import tempfile
 
 import z3
 
-from cpp_function import Pointer, Runs, Word, code, load
+from cpp_function import Pointer, Runs, Unread, Word, code, load
 
 HALF = 0xFFFF
 LIMB_BITS = 32
@@ -159,7 +160,23 @@ def no_limb_is_held_in_anything_wider():
         assert lanes <= {"uint32_t"}, (path, lanes)
 
 
-PROOFS = (multiply_add_equals_the_wide_product_plus_both_addends,
+def line_outside_the_dialect_is_named():
+    """A change that the translation cannot follow must end a proof, and say where."""
+    for line in ("const uint16_t cut = static_cast<uint16_t>(a);", "while (a < 3) ++a;", "a = a ? 1 : 2;",
+                 "if (a == 1) { return a; } else { a = 2; }", "a = unknown(a);"):
+        with tempfile.NamedTemporaryFile("w", suffix=".cpp") as source:
+            source.write(f"int f(int a) {{\n  ++a;\n  {line}\n  return a;\n}}\n")
+            source.flush()
+            try:
+                load(source.name, "f")(1)
+            except Unread as error:
+                assert f"{source.name}:3: `{line}`" in str(error), error
+            else:
+                raise AssertionError(f"{line} is read")
+
+
+PROOFS = (line_outside_the_dialect_is_named,
+          multiply_add_equals_the_wide_product_plus_both_addends,
           half_digit_is_quotient_and_remainder,
           plain_text_is_eight_bytes_above_the_line_ends,
           windows_make_up_the_exponent,

@@ -1,0 +1,79 @@
+#!/usr/bin/env python3
+"""Looks up what the docs name: tests, the files that they link, and on docs/architecture.md each function
+in its file."""
+
+import re
+import sys
+
+from sources import ROOT, report, without_comments
+
+DOCS = [*sorted(ROOT.glob("*.md")), *sorted((ROOT / "docs").rglob("*.md"))]
+
+# `Suite.Test`, `Suite.*`, or either with the prefix of a suite that is instantiated.
+NAMED = re.compile(r"`((?:\w+/)?[A-Z]\w+)\.(\*|[A-Z]\w+)`")
+DEFINED = re.compile(r"^TEST(?:_F|_P)?\(\s*(\w+),\s*(\w+)\)", re.M)
+INSTANTIATED = re.compile(r"INSTANTIATE_TEST_SUITE_P\(\s*(\w+),\s*(\w+),")
+PROJECT = re.compile(r"apktoolkit_add_project_test\((\w+) ")
+LINK = re.compile(r"\]\(([^)#:]+)(?:#[^)]*)?\)")
+
+PAGE = ROOT / "docs/architecture.md"
+PATH = r"\w[\w/]*/\w+\.(?:cpp|h|md|py)"
+# A stop of the picture, a row of the table, an answer.
+STOP = re.compile(rf"^[ |:v]*([\w:]+) +({PATH})", re.M)
+ROW = re.compile(rf"^\|[^|]*\| ([^|]*) \| ((?:`{PATH}`(?:, )?)+) \|$", re.M)
+ANSWER = re.compile(rf"`([\w:]+)`\s+in\s+`({PATH})`")
+
+
+def tests_that_there_are():
+    """All tests, as (suite, test)."""
+    found = set()
+    for path in (ROOT / "tests").rglob("*_test.cpp"):
+        source = path.read_text()
+        found.update(DEFINED.findall(source))
+        for prefix, suite in INSTANTIATED.findall(source):
+            found.update((f"{prefix}/{suite}", test)
+                         for name, test in DEFINED.findall(source) if name == suite)
+    lists = (ROOT / "tests/project/CMakeLists.txt").read_text()
+    found.update(("Project", test) for test in PROJECT.findall(lists))
+    return found
+
+
+def test_and_link_problems():
+    tests = tests_that_there_are()
+    suites = {suite for suite, _ in tests}
+    count = 0
+    for page in DOCS:
+        text = page.read_text()
+        for suite, test in NAMED.findall(text):
+            count += 1
+            if (suite not in suites) if test == "*" else ((suite, test) not in tests):
+                yield f"{page.relative_to(ROOT)}: there is no test {suite}.{test}"
+        for link in LINK.findall(text):
+            if not (page.parent / link).exists():
+                yield f"{page.relative_to(ROOT)} links {link}, which is not there"
+    if count < 50:
+        yield f"only {count} tests are named: the pattern NAMED misses them"
+
+
+def function_problems():
+    text = PAGE.read_text()
+    places = STOP.findall(text) + ANSWER.findall(text)
+    for functions, files in ROW.findall(text):
+        files = re.findall(PATH, files)
+        functions = re.findall(r"`([^`]+)`", functions)
+        places += zip(functions, files if len(files) > 1 else files * len(functions))
+    for function, path in places:
+        source = ROOT / path
+        name = function.rpartition("::")[2]
+        defined = rf"^\S(?:[^;{{}}\n]*[\s*:])?{name}(?:\([^;{{}}]*\)[^;{{}}()]*\{{|\[)"
+        if not source.exists() or not re.search(defined, without_comments(source.read_text()), re.M):
+            yield f"docs/architecture.md: {path} has no {function}"
+    yield from (f"docs/architecture.md: there is no {path}"
+                for path in re.findall(PATH, text) if not (ROOT / path).exists())
+    if len(places) < 50:
+        yield f"docs/architecture.md names only {len(places)} functions: the patterns miss them"
+
+
+if __name__ == "__main__":
+    sys.exit(report([*test_and_link_problems(), *function_problems()],
+                    "the page that is named: write there what the sources have now"))
