@@ -312,7 +312,7 @@ void AddRun(CLI::App* app, Options* options, std::string* runner) {
       ->take_last();
 }
 
-// Nothing is signed then, and so there is no verdict that could be told.
+// Nothing is signed then, so the options for verdicts have no meaning.
 void AddVerify(CLI::App* app, Options* options) {
   CLI::Option* const verify = app->add_flag("--verify", options->verify,
                                             "Sign nothing: ask the kernel which FILEs it\n"
@@ -325,7 +325,7 @@ void AddVerify(CLI::App* app, Options* options) {
   verify->option_text(" ");  // in place of all that it excludes, which is too long for a line
 }
 
-// What begins with "-" and is no option may have been meant for a file.
+// A word that begins with "-" and does not name an option may be the name of a file.
 std::optional<int> NameUnknownOption(const CLI::App& app) {
   std::vector<std::string> unknown = app.remaining();
   unknown.erase(std::remove(unknown.begin(), unknown.end(), "--"), unknown.end());
@@ -357,7 +357,7 @@ bool ReadLevels(const std::string& text, LevelRange* levels) {
   return levels->first >= 1 && levels->first <= levels->last;
 }
 
-// 0 when there is no error of this name.
+// 0 when no error has this name.
 int ErrorNumber(const std::string& name) {
   constexpr int kLast = 4095;  // the highest that a system call can answer
   for (int error = 1; error <= kLast; ++error) {

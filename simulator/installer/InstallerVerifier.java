@@ -1,9 +1,9 @@
-// What the platform's own verifier (apksig) says of packages: what a phone's installer answers.
+// Asks the platform's own verifier (apksig) about packages, as a phone's installer does.
 //
 // Arguments: the first and the last API level of the phones. Standard input has the path of one
 // package a line. Each is answered on standard output by one line, a JSON object in ASCII. The
 // program ends with its input. docs/journal.md describes the ranges of API levels; an object with
-// "failure" instead says why there is no answer.
+// "failure" says why the verifier has no answer.
 
 import com.android.apksig.ApkVerifier;
 import com.android.apksig.apk.ApkFormatException;
@@ -106,7 +106,7 @@ public final class InstallerVerifier {
         }
     }
 
-    // What is said of the phones of some levels.
+    // The answer for the phones of some levels.
     private static final class Range {
         final int first;
         int last;
@@ -167,8 +167,8 @@ public final class InstallerVerifier {
         return false;
     }
 
-    // What the result says of one scheme. Older generations of apksig do not know all schemes, so
-    // the methods are looked for by their names.
+    // Adds the result's answers for one scheme. Older generations of apksig do not know all
+    // schemes, so the methods are looked for by their names.
     private static void describe(ApkVerifier.Result result, String[] scheme, List<String> schemes,
             List<String> signers, List<Object> errors, List<Object> warnings) throws Exception {
         boolean isVerified;

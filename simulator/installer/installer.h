@@ -37,8 +37,8 @@ class Installer {
   // Why nothing can be asked, with what to install; none when it can.
   std::optional<std::string> Missing() const;
 
-  // What the phones' installer says of the file: kNotAsked for what is no package. Several threads
-  // may ask; they are answered one after the other.
+  // Asks the phones' installer about the file. The result is kNotAsked for a file that is not a
+  // package. Several threads may ask; they are answered one after the other.
   Judgement Judge(const std::string& file);
 
  private:
@@ -48,7 +48,7 @@ class Installer {
 
   const InstallerOptions& options_;
   std::mutex mutex_;              // of all below
-  std::optional<ScopedFd> pipe_;  // both ways; none: there is no process
+  std::optional<ScopedFd> pipe_;  // both ways; none: the process does not run
   pid_t process_ = -1;
 };
 

@@ -102,14 +102,14 @@ std::optional<std::string> FromHex(const std::string& digits) {
   return bytes;
 }
 
-// Empty when there is no such text.
+// Empty when the object has no text of that name.
 std::string TextOf(const Json& json, const char* key) {
   if (!json.is_object()) return {};
   const auto text = json.find(key);
   return text != json.end() && text->is_string() ? text->get<std::string>() : std::string();
 }
 
-// Null when there is no such list.
+// Null when the object has no list of that name.
 const Json* ListOf(const Json& json, const char* key) {
   if (!json.is_object()) return nullptr;
   const auto list = json.find(key);

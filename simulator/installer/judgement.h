@@ -1,6 +1,6 @@
-// What the platform's own verifier says of a package: whether the installer of a phone takes it.
-// Its answers are texts of another program about a hostile file, so each is read with care, and
-// what does not read counts as no answer.
+// The judgement of the platform's own verifier: whether the installer of a phone takes a package.
+// The answers are texts of another program about a hostile file. Each is read with care, and a
+// malformed one counts as no answer.
 #pragma once
 
 #include <climits>
@@ -45,7 +45,7 @@ struct RangeJudgement {
 
 struct Judgement {
   enum class State {
-    kNotAsked,  // nobody wanted to know, or the file is no package
+    kNotAsked,  // nobody asked, or the file is not a package
     kMissing,   // the verifier is not installed
     kGaveUp,    // the verifier did not survive the file, or had no answer
     kJudged,

@@ -1,5 +1,5 @@
-// What a compiled AndroidManifest.xml says, as the tool reads it and as the phone's installer does:
-// the two go by other rules, and a package can be named for each of them.
+// A compiled AndroidManifest.xml, as the tool reads it and as the phone's installer does. The two
+// follow different rules, so a package can have one name for each of them.
 #pragma once
 
 #include <cstdint>

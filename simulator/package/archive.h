@@ -1,6 +1,6 @@
 // The entries of a zip archive, by the platform's own zip library and the tool's way to it: the
-// same entries, in the same order. Nobody vouches for the file, so what is read is bounded. What
-// the library and the tool's code log from here goes nowhere.
+// same entries, in the same order. Nobody vouches for the file, so each reading has a bound. Log
+// messages of the library and of the tool's code are dropped here.
 //
 // The library maps a part of the file into memory. Should the file become shorter meanwhile, the
 // missing part reads as zeros while an Archive lives, and HasShrunk() tells.

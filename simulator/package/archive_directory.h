@@ -16,7 +16,7 @@ struct ArchiveEnd {
   uint32_t directory_offset;
 };
 
-// What the directory says of one entry.
+// One entry, as the directory describes it.
 struct ArchiveEntry {
   std::string name;  // any bytes
   uint64_t size;     // what its data takes in the archive, in bytes

@@ -166,7 +166,7 @@ std::string NameText(const X509_NAME* name) {
 
 // The library would print the whole name as well, but with keywords of its own, and people look for
 // the JDK's. The value is the library's work: in quotation marks where special characters ask for
-// them, and as hexadecimal digits where it is no text.
+// them, and as hexadecimal digits where it is not a text.
 std::string AttributeText(const X509_NAME_ENTRY* attribute) {
   constexpr unsigned long kFlags = ASN1_STRFLGS_ESC_2253 | ASN1_STRFLGS_ESC_QUOTE |
                                    ASN1_STRFLGS_UTF8_CONVERT | ASN1_STRFLGS_DUMP_UNKNOWN |

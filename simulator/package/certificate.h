@@ -27,7 +27,7 @@ struct CertificateFacts {
   bool is_self_issued = false;  // issuer and subject are the same name
   std::string sha256;           // of the whole certificate
   std::string sha1;             // of the same, for stores that name a signer by it
-  // What it is signed with, such as "SHA384withRSA".
+  // The algorithm of the certificate's own signature, such as "SHA384withRSA".
   std::string signature_algorithm;
   bool has_known_digest = false;  // it is signed with RSA PKCS#1 v1.5 over MD5, SHA-1 or SHA-256
   // The last second at which it is valid, counted since 1970 in UTC; none: it does not read.
@@ -39,7 +39,7 @@ struct CertificateFacts {
   std::string key_id;
 };
 
-// The certificate at the start of the bytes; none when there is none.
+// The certificate at the start of the bytes; none when the bytes do not begin with one.
 std::optional<CertificateFacts> ParseCertificate(std::string_view der);
 
 struct AlgorithmFacts {

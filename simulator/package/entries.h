@@ -1,6 +1,5 @@
-// What the manifest says of each entry of a package, and whether it is so. Which digest is listed
-// for which name, and whether it is the entry's, is asked of the tool's own code. The tool itself
-// looks at few of them.
+// The entries of a package, each compared with its digest in the manifest. The tool's own code
+// finds the digest for a name and compares it. The tool itself looks at few entries.
 #pragma once
 
 #include <cstdint>
@@ -12,7 +11,7 @@
 
 namespace simulator {
 
-// What the tool's code makes of an entry and its digest in the manifest.
+// The answer of the tool's code for an entry and its digest in the manifest.
 enum class EntryDigest {
   kUnlisted,  // there is none
   kMatches,

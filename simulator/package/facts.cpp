@@ -21,7 +21,8 @@ namespace simulator {
 
 namespace {
 
-// Nothing waits for a writer or for whoever holds a lease, and a terminal stays whose it was.
+// Opening does not wait for a writer or for the holder of a lease, and does not take a terminal
+// over.
 constexpr int kOpenFlags = O_RDONLY | O_CLOEXEC | O_NONBLOCK | O_NOCTTY;
 
 FileKind KindOf(int fd, uint64_t size);
@@ -162,7 +163,7 @@ void FindLibraries(const Archive& archive, const std::string& path, PackageFacts
   }
 }
 
-// What lies at the place of the library, told by opening it as the tool does.
+// Opens the file at the library's place as the tool does.
 LibraryFacts FindLibrary(const std::string& entry, const std::string& path) {
   LibraryFacts library;
   library.entry = entry;

@@ -1,6 +1,6 @@
-// What can be said of a file by looking at it: what it is, and, of a package, who signed it, what
-// its signature lists, and which of its libraries lie beside it. It explains what the tool did and
-// decides nothing: what does not read here is simply not there.
+// The facts that the simulator finds in a file: its kind, and, of a package, the signer, the
+// entries that the signature lists, and the libraries that lie beside it. The facts explain the
+// tool's answer and decide nothing. A malformed part counts as missing.
 #pragma once
 
 #include <cstdint>
@@ -63,7 +63,7 @@ struct PackageFacts {
   bool has_damaged_signing_block = false;
   std::vector<std::string> too_long;  // what is there and was not looked into, for its length
   std::vector<ListedEntry> entries;
-  std::vector<std::string> missing;  // names that the manifest lists, and there is no such entry
+  std::vector<std::string> missing;  // names that the manifest lists and the archive does not have
   // In the order in which the tool walks through them, damaged ones last.
   std::vector<LibraryFacts> libraries;
 };

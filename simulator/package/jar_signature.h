@@ -1,7 +1,7 @@
-// The JAR signature that the tool looks at, and what stands beside it. What the tool reads of it is
-// asked of the tool's own code: the texts, the key, the names of the files. What only explains is
-// read strictly (signature_block.h) or by libcrypto (certificate.h). Whether any of it holds is for
-// the tool to say.
+// The JAR signature that the tool looks at, and the facts beside it. The tool's own code reads the
+// texts, the key and the names of the files. Parts that only explain are read strictly
+// (signature_block.h) or by libcrypto (certificate.h). Only the tool says whether the signature
+// holds.
 #pragma once
 
 #include <cstddef>
@@ -30,7 +30,7 @@ struct JarSignatureFacts {
   // Those entries META-INF/*.SF, in the tool's order: it takes the first.
   std::vector<std::string> signature_files;
   std::string claimed_schemes;        // X-Android-APK-Signed, such as "2, 3"; empty: not stated
-  bool has_manifest_digest = false;   // the signature file states one, of whatever kind
+  bool has_manifest_digest = false;   // the signature file states one, of any kind
   bool has_sha1_of_manifest = false;  // the one that the tool takes is a SHA-1 digest
   // The block that the tool looks for, "RSA"; or one of another kind of key, if that alone is
   // there.

@@ -1,5 +1,5 @@
-// Surviving a mapped file that becomes shorter while it is read. What lies behind its new end has
-// no bytes any more, and touching it ends a process by SIGBUS.
+// Surviving a mapped file that becomes shorter while it is read. The pages behind its new end have
+// no bytes any more, and touching them ends a process by SIGBUS.
 #pragma once
 
 namespace simulator {

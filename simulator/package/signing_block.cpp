@@ -29,7 +29,7 @@ bool TakePrefixed(CBS* bytes, CBS* part);
 }  // namespace
 
 // size, pairs, size again, magic; each size counts all but the first size field. Where the two
-// sizes are not the same, there is no block to the platform.
+// sizes differ, the platform finds no block.
 std::string ReadSigningBlock(int fd, const ArchiveEnd& end, bool* is_too_large) {
   *is_too_large = false;
   if (end.directory_offset < kSizeField + kFooter) return {};

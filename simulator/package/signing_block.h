@@ -1,7 +1,7 @@
 // The signatures of the schemes after JAR signing (v2, v3, v3.1), as far as whose key made them:
 // the signing block, which lies between an archive's entries and its central directory. Found as
-// the platform finds it. Digests and signatures are not verified. What is read is bounded and
-// points into the caller's bytes.
+// the platform finds it. Digests and signatures are not verified. All results are bounded and point
+// into the caller's bytes.
 #pragma once
 
 #include <cstdint>
@@ -30,7 +30,8 @@ struct SigningBlock {
 inline constexpr uint64_t kMostBlockBytes = 16 << 20;
 
 // The signing block of the archive that is open as `fd`, from its first size field to its magic.
-// Empty when there is none, or when it is larger than kMostBlockBytes, which `is_too_large` tells.
+// Empty when the archive has no such block, or one that is larger than kMostBlockBytes, which
+// `is_too_large` tells.
 std::string ReadSigningBlock(int fd, const ArchiveEnd& end, bool* is_too_large);
 
 SigningBlock ParseSigningBlock(std::string_view block);

@@ -1,6 +1,6 @@
 // The files in which the kernel publishes each task's integrity value: /proc/self/integrity/value
-// and /proc/PID/integrity/value, for whoever opens them through the C library. They can only be
-// read. Each opening, of whichever task's file, answers the next of the phone's integrity values.
+// and /proc/PID/integrity/value, for callers that open them through the C library. They can only be
+// read. Each opening, of any task's file, answers the next of the phone's integrity values.
 #include <fcntl.h>
 #include <sys/mman.h>
 #include <unistd.h>

@@ -3,7 +3,7 @@
 //
 // This file, integrity_file.cpp, log.cpp and standard_output.cpp are one library that is loaded
 // before all others and takes the place of those functions through which the tool meets a phone.
-// What does not concern the phone goes on to the next function of that name, unchanged.
+// Calls that do not concern the phone go on to the next function of that name, unchanged.
 #include <fcntl.h>
 #include <sys/mman.h>
 #include <sys/stat.h>
@@ -90,7 +90,7 @@ int Verify(int fd) {
   return Answer(&event, error, errno_before);
 }
 
-// A descriptor that names a file without having opened it (O_PATH) is none to the kernel here.
+// The kernel does not accept a descriptor that names a file without having opened it (O_PATH).
 int DescriptorError(int fd) {
   const int flags = fcntl(fd, F_GETFL);
   return flags < 0 || (flags & O_PATH) != 0 ? EBADF : 0;

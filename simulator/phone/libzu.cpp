@@ -11,7 +11,7 @@ namespace simulator {
 
 namespace {
 
-// What the tool gets on a workstation, where there is no service to register with.
+// The tool gets this on a workstation, which has no service to register with.
 constexpr int kNoService = -1;
 
 }  // namespace

@@ -59,7 +59,7 @@ int Number(const char* name, int otherwise) {
   return text == nullptr ? otherwise : static_cast<int>(strtol(text, nullptr, 10));
 }
 
-// What is no DEVICE:INODE gives inode 0, which no file has.
+// A word that is not DEVICE:INODE gives inode 0, which no file has.
 FileId ParseFileId(const std::string& text) {
   const size_t colon = text.find(':');
   if (colon == std::string::npos) return {0, 0};

@@ -1,6 +1,7 @@
-// What the simulated phone is like. The settings travel from apktoolkit-sim to the stand-ins in
-// environment variables, one per setting, all with the prefix APKTOOLKIT_SIM_; what is not set is
-// as on a healthy phone. Shared by both sides, so that the names and formats stand in one place.
+// The settings of the simulated phone. They travel from apktoolkit-sim to the stand-ins in
+// environment variables, one per setting, all with the prefix APKTOOLKIT_SIM_. A setting without a
+// variable is as on a healthy phone. Both sides use this file, so that names and formats stand in
+// one place.
 #pragma once
 
 #include <sys/types.h>
@@ -11,7 +12,7 @@
 
 namespace simulator {
 
-// A file as the kernel tells files apart, whatever its name.
+// A file as the kernel tells files apart, independent of its name.
 struct FileId {
   dev_t device;
   ino_t inode;
@@ -21,22 +22,22 @@ inline bool operator==(const FileId& a, const FileId& b) {
   return a.device == b.device && a.inode == b.inode;
 }
 
-// In `PhoneSettings::integrity`: at this opening there is no such file.
+// In `PhoneSettings::integrity`: at this opening the file does not exist.
 inline constexpr char kMissing[] = "missing";
 
 struct PhoneSettings {
-  // The file that the stand-ins append their events to. Empty: there is no simulation, nothing is
-  // recorded, and libzu finds no service.
+  // The file that the stand-ins append their events to. Empty: nothing is simulated or recorded,
+  // and libzu finds no service.
   std::string journal;
-  // What each opening of an integrity file finds in it; the last one repeats. Never empty.
+  // The contents of an integrity file, one for each opening; the last one repeats. Never empty.
   std::vector<std::string> integrity = {"1f"};
   // The files that the kernel trusts from the start.
   std::vector<FileId> trusted;
-  // What the kernel answers to a signing that is in order, 0: it signs.
+  // The kernel's answer to a signing that is in order; 0: it signs.
   int sign_errno = 0;
-  // What the kernel answers when it verifies a file that it does not trust.
+  // The kernel's answer when it verifies a file that it does not trust.
   int verify_errno = ENOKEY;
-  // What libzu answers to a registration.
+  // The answer of libzu to a registration.
   int zu_result = 0;
 };
 

@@ -1,6 +1,6 @@
-// What the stand-ins inside the tool's process share: the phone's settings, the journal, and ways
-// to stay unseen. Each of the two libraries has these for itself. Nothing here is destroyed at
-// exit, since the tool's last output is recorded after the destructors have run.
+// Shared by the stand-ins inside the tool's process: the phone's settings, the journal, and ways to
+// stay unseen. Each of the two libraries has these for itself. Nothing here is destroyed at exit,
+// since the tool's last output is recorded after the destructors have run.
 #pragma once
 
 #include <cerrno>

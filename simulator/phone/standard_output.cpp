@@ -1,6 +1,7 @@
-// What the tool prints, among the other events: `stdout` becomes a stream of complete lines that
-// are recorded and then written to the descriptor that they were meant for. On a phone, nobody
-// sees when the bytes of a line leave the process; here each line has its place in the journal.
+// The tool's standard output, as events among the others: `stdout` becomes a stream of complete
+// lines that are recorded and then written to the descriptor that they were meant for. On a phone,
+// nobody sees when the bytes of a line leave the process; here each line has its place in the
+// journal.
 #include <unistd.h>
 
 #include <cstdio>

@@ -21,7 +21,8 @@ std::string DecodeText(std::string_view utf8);
 // The lower-case hexadecimal digits of the bytes.
 std::string HexText(std::string_view bytes);
 
-// The length of the valid UTF-8 character that `bytes` starts with, 0 when there is none.
+// The length of the valid UTF-8 character that `bytes` starts with, 0 when it does not start with
+// one.
 size_t Utf8Length(std::string_view bytes);
 
 // Whether the valid UTF-8 character is one that a terminal obeys, or that has no width or turns the

@@ -10,11 +10,11 @@ namespace simulator {
 
 using Events = std::vector<nlohmann::json>;
 
-// The events of a journal's lines. Lines that are no JSON are not ours and do not count.
+// The events of a journal's lines. Lines that are not JSON come from elsewhere and do not count.
 Events ParseEvents(const std::string& journal);
 
-// What `event` has under `key`: a text as the bytes that it was, or a number. Empty, or 0, when it
-// is not there.
+// The value of `event` under `key`: a text as its original bytes, or a number. Empty, or 0, when
+// the key is missing.
 std::string TextOf(const nlohmann::json& event, const char* key);
 int64_t NumberOf(const nlohmann::json& event, const char* key);
 

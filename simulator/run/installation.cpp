@@ -31,7 +31,7 @@ namespace fs = std::filesystem;
 constexpr const char* kPhoneAbis[] = {"arm64-v8a", "armeabi-v7a", "armeabi"};
 constexpr char kArm64Directory[] = "lib/arm64";
 
-// What goes where: the path below the package's directory, and the entry that it comes from.
+// Each path below the package's directory, with the entry that it comes from.
 using Layout = std::map<std::string, std::string>;
 
 std::vector<std::string> LibraryNames(const Archive& archive);
@@ -81,7 +81,7 @@ std::optional<std::string> Installation::LayOut(const std::string& file, Install
     return failure(fs::path(directory).parent_path().string(), errno);
   }
   directory_ = fs::canonical(directory, error).string();
-  // Whatever the file is called: a library's directory has another name.
+  // Always under this name, since a library's directory has another one.
   const std::string copy = directory_ + "/base.apk";
   if (!PutPackage(file, source.get(), copy, deadline)) {
     return failure(std::string(kInstalledDirectory) + "base.apk", errno);

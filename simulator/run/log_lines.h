@@ -8,7 +8,8 @@
 
 namespace simulator {
 
-// What a record of the tool's log says. What is captured of it, if anything, stands behind.
+// The meaning of a record of the tool's log. A comment behind it names the captured parts, if there
+// are any.
 enum class LogMeaning {
   // None of the texts; a detail of an error that another record names as well.
   kUnknown,
@@ -20,8 +21,8 @@ enum class LogMeaning {
   kPackageTakenUp,
   kJarTakenUp,
   kNotSigned,
-  // Why a file is no package, or none that is good. Captured are the zip library's code or reason,
-  // the block's name, and the codes of crypto/rsa.h.
+  // Reasons why a file is not a package, or not a good one. Captured are the zip library's code or
+  // reason, the block's name, and the codes of crypto/rsa.h.
   kNoArchive,
   kNoAndroidManifest,
   kNoBlock,
@@ -36,7 +37,7 @@ enum class LogMeaning {
   kAndroidManifestMalformed,
   kNoGoodPackage,
   kNoArchiveToSign,
-  // Why a library or the dex file is none that is good. Captured are the library's path and errno,
+  // Reasons why a library or the dex file is not good. Captured are the library's path and errno,
   // which comes in the record behind.
   kFileNotOpened,
   kFileNotRead,
@@ -62,7 +63,7 @@ struct LogLine {
 // A record's text, complete or cut as the log cuts what is too long.
 LogLine ReadLogLine(const std::string& text);
 
-// The first line of this meaning; null when there is none.
+// The first line of this meaning; null when no line has it.
 const LogLine* FindError(const std::vector<LogLine>& lines, LogMeaning meaning);
 
 }  // namespace simulator

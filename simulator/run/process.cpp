@@ -18,8 +18,8 @@ void Catch(int signal) { caught = signal; }
 
 }  // namespace
 
-// What takes the place is closed by exec, and cannot be written to: output that nobody gets is a
-// failure.
+// The descriptor in its place is closed by exec and cannot be written to, because output that
+// nobody gets is a failure.
 bool KeepStandardStreams() {
   const bool has_input = fcntl(STDIN_FILENO, F_GETFD) >= 0;
   for (const int stream : {STDIN_FILENO, STDOUT_FILENO, STDERR_FILENO}) {

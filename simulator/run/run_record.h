@@ -81,7 +81,7 @@ struct RunRecord {
   std::optional<int64_t> signal;          // that the tool was killed by
   int64_t status = 0;
 
-  // What the simulator itself knows of the run.
+  // Facts that the simulator itself knows of the run.
   Failure failure;
   ToolIdentity tool;
   bool has_standard_input = true;  // the tool was started with one

@@ -1,10 +1,9 @@
-// What the phone's kernel has signed so far. A file stays trusted while it has the bytes that were
-// signed, and no longer, under whatever name.
+// The bytes that the phone's kernel has signed so far. A file is trusted, under any name, as long
+// as it has bytes that were signed.
 //
-// With a directory, what is remembered are SHA-256 digests, across runs: each is a file of that
-// name in the directory, which holds the path of what was signed, for the reader. Without one,
-// files are remembered as long as this object lives, and digested only when another is as long as
-// they are.
+// With a directory, SHA-256 digests are remembered across runs. Each is the name of a file in the
+// directory, which holds the path of the signed file, for the reader. Without one, files are
+// remembered as long as this object lives, and digested only when another is as long as they are.
 #pragma once
 
 #include <sys/stat.h>

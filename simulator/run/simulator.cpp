@@ -115,7 +115,7 @@ FileRun Simulator::Run(const ListedFile& listed) {
   run.record.of_other_processors = installation.of_other_processors();
   run.record.not_laid_out = installation.left_out();
   run.record.not_extracted = installation.not_extracted();
-  // What cannot be judged is not looked at.
+  // A run that cannot be judged needs no facts.
   if (task.failure.kind != Failure::Kind::kNone) return run;
   run.facts = LookAt(installed, [&task] { return task.deadline.HasPassed(); });
   struct stat after = {};

@@ -16,7 +16,7 @@
 
 namespace simulator {
 
-// What the phone is like, and how the tool is run in it.
+// The phone, and how the tool is run in it.
 struct RunOptions {
   PhoneSettings phone;             // all but its journal and its trusted files
   std::vector<std::string> trust;  // existing files that the kernel trusts
@@ -30,7 +30,7 @@ struct RunOptions {
   double timeout = 30;                          // seconds, for each file
 };
 
-// What one run gave to judge by.
+// The results of one run, from which it is judged.
 struct FileRun {
   RunRecord record;
   PackageFacts facts;   // of the file where the tool found it

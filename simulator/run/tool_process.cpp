@@ -73,8 +73,8 @@ Words EnvironmentWith(const Words& assignments) {
   return environment;
 }
 
-// 0, or the errno that tells why there is no child. It gets the standard streams alone: whatever
-// the caller has open, the tool's first file is descriptor 3, as on a phone.
+// Returns 0, or the errno that tells why no child was started. The child gets the standard streams
+// alone, so that the tool's first file is descriptor 3, as on a phone.
 int Spawn(Words words, Words environment, pid_t* child) {
   posix_spawn_file_actions_t actions;
   posix_spawn_file_actions_init(&actions);

@@ -22,7 +22,7 @@ bool BeginsWith(const std::string& path, std::string_view start) {
   return file && found == start;
 }
 
-// What a path leads to, whether or not its last part is there.
+// The file that a path leads to. Its last part need not exist.
 fs::path Resolved(const std::string& path) {
   std::error_code error;
   const fs::path resolved = fs::weakly_canonical(fs::absolute(path, error), error);

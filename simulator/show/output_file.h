@@ -35,7 +35,7 @@ class OutputFile {
   bool Open();
   // The same for what comes next in it.
   bool Append(std::string_view text) const;
-  // What to tell the user then.
+  // The message for the user after a failure.
   std::string ErrorText() const;
 
  private:

@@ -1,7 +1,7 @@
 // The page for a browser: one self-contained HTML document for all files of a run, without scripts
-// and without anything from elsewhere. It says what the terminal says, in the same words, and
-// shows which bytes of a package its signature protects. Whatever comes from a file is escaped, and
-// there is only so much of it, be the file as large as it may.
+// and without anything from elsewhere. It says what the terminal says, in the same words, and shows
+// which bytes of a package its signature protects. All texts from a file are escaped, and their
+// length and number are bounded for a file of any size.
 #pragma once
 
 #include <ctime>
@@ -18,7 +18,7 @@
 
 namespace simulator {
 
-// What each page begins with.
+// The beginning of each page.
 inline constexpr std::string_view kPageStart =
     "<!DOCTYPE html>\n<!-- A page of apktoolkit-sim -->\n";
 

@@ -22,7 +22,7 @@ Share Between(const Protection& protection, uint64_t file_size) {
 }  // namespace
 
 std::vector<DrawnPart> DrawBar(const Protection& protection, uint64_t file_size) {
-  constexpr double kLeast = 0.75;  // percent of the width, for whatever is there
+  constexpr double kLeast = 0.75;  // percent of the width, for each part that is not empty
   std::vector<DrawnPart> parts = {
       {"verified", kVerifiedWord, "dex and native libraries, compared with the manifest", true,
        protection.verified, 0, 0, 0},

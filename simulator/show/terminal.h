@@ -17,9 +17,9 @@ struct Look {
 Look LookOfStandardOutput();
 
 // `bytes` without anything that a terminal would obey or that would mislead the eye: control
-// characters, what is no UTF-8, and characters that turn the direction of writing are shown as
-// \xNN, byte by byte, and so is all beyond ASCII where `look` has no more. A line end at the end is
-// left out.
+// characters, bytes that are not UTF-8, and characters that turn the direction of writing are shown
+// as \xNN, byte by byte. Where `look` has only ASCII, so are all other characters. A line end at
+// the end is left out.
 std::string Printable(std::string_view bytes, const Look& look);
 
 enum class Colour { kPlain, kGreen, kRed, kYellow };

@@ -77,7 +77,7 @@ Line DescribeIntegrity(const json& event) {
   return {"integrity", whose + " reads " + text + remark, "", false};
 }
 
-// What the kernel said to a request to sign or to verify.
+// The kernel's answer to a request to sign or to verify.
 Line DescribeAnswer(const json& event, const std::string& directory) {
   const std::string kind = TextOf(event, "event");
   std::string path = TextOf(event, "path");

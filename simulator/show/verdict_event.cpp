@@ -67,7 +67,7 @@ std::string SignerJson(const std::string& scheme, const CertificateFacts& signer
   return Object(members);
 }
 
-// Of the JAR signature the key is the kernel's, whatever the certificate shows.
+// The key of the JAR signature is the kernel's, even where the certificate shows another one.
 std::string SignersJson(const Report& report) {
   std::vector<std::string> signers;
   if (report.signer || report.key) {

@@ -1,5 +1,5 @@
-// The words in which a report is told, whatever they are shown on. Names and details in them come
-// from the files as they are: whoever shows them sees to what may be shown.
+// The words of a report, for the terminal and the page alike. Names and details in them come from
+// the files as they are. The caller makes them fit to be shown.
 #pragma once
 
 #include <optional>
@@ -12,7 +12,7 @@
 
 namespace simulator {
 
-// What a verdict means to the one who reads it.
+// The meaning of a verdict for its reader.
 enum class Mood { kGood, kMixed, kBad };
 
 struct VerdictWords {
@@ -53,7 +53,7 @@ std::string DecisiveReason(const Report& report);
 // is; then a signer who was not expected, the alarms, and the number of all warnings.
 std::vector<std::string> HeadFacts(const Report& report, const char* ellipsis);
 
-// What stands before a line.
+// The mark before a line.
 enum class Mark { kGood, kBad, kNeither };
 
 Mark MarkOf(ItemState state);
@@ -67,7 +67,7 @@ const char* SymbolOf(Mark mark, bool has_utf8);
 
 std::string NameOf(const Item& item);
 
-// What came of the item, and why; `verdict` is its report's.
+// The item's result and its reason; `verdict` is its report's.
 std::string OutcomeOf(const Item& item, Verdict verdict);
 
 // Where the tool found the file.
@@ -83,7 +83,7 @@ inline constexpr char kLaidOutText[] =
 // not where it follows from another; `next` is what stands below, null for nothing.
 bool HasCure(const Item& item, const Item* next);
 
-// What stands at the link, and "not reached" beyond a break.
+// The text at the link, or "not reached" beyond a break.
 std::string TextOf(const Link& link);
 
 // Label and value for each fact. The labels are those of apksigner, so that one search finds both.

@@ -6,7 +6,7 @@
 
 namespace simulator {
 
-// What a cause is about.
+// The subject of a cause.
 enum class Group {
   kNotLookedAt,  // the tool did not look at the file
   kSimulation,   // the simulation could not tell
@@ -21,15 +21,15 @@ enum class Group {
   kWarning,    // all may be signed, and yet
 };
 
-// What a cause means for the thing that it is said of.
+// The effect of a cause on its item.
 enum class Severity {
   kFailed,   // nothing is told of the file
   kUnseen,   // the tool left the file alone
   kRefused,  // it should have been signed or registered, and was not
   kFollows,  // the same, and something else has to be cured for it
-  kAbsent,   // there is nothing to sign; a refusal for whoever is strict
+  kAbsent,   // there is nothing to sign; a refusal under --strict
   kNothing,  // there is nothing to sign
-  kDoubt,    // a warning; a refusal for whoever is strict
+  kDoubt,    // a warning; a refusal under --strict
   kWarning,
   kAlarm,  // a warning that stands in the line of the verdict as well
 };

@@ -1,4 +1,4 @@
-// What the phones' installer makes of a package, beside what the tool made of it.
+// The item for the judgement of the phones' installer, beside the tool's own.
 #include <algorithm>
 
 #include "simulator/verdict/parts.h"

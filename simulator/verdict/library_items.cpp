@@ -36,7 +36,7 @@ void AddLibraryItems(const RunRecord& run, const PackageFacts& facts, const Judg
     Item item = {ItemKind::kLibrary, name, "", ItemState::kDone, {}};
     if (reason.cause != nullptr) item = NotDone(ItemKind::kLibrary, name, reason, options);
     item.entry = found.entry;
-    // What was compared is not the same, or it comes before the kernel.
+    // The tool hands a library to the kernel only after its bytes matched.
     item.is_verified =
         library.attempt != nullptr && library.attempt->outcome != Attempt::Outcome::kNotVerified;
     items->push_back(item);

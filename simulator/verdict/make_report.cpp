@@ -172,8 +172,9 @@ void AddKeyItems(const RunRecord& run, const JudgeOptions& options, std::vector<
   if (run.has_no_key_path) add("", {&cause::kRegistrationNoPath, ""});
 }
 
-// What else went wrong. What was logged while the file was opened is the reason why a package was
-// refused, or what a JAR lacks of a package; beside a package that was signed it is neither.
+// All other failures. A message that was logged while the file was opened is the reason why a
+// package was refused, or names the part that a JAR lacks of a package. Beside a signed package it
+// is a failure of its own.
 void AddToolItems(const RunRecord& run, const JudgeOptions& options, std::vector<Item>* items) {
   const auto add = [&](const Reason& reason) {
     items->push_back(NotDone(ItemKind::kTool, "tool", reason, options));
@@ -241,7 +242,7 @@ void DescribeSigners(const RunRecord& run, const PackageFacts& facts, Report* re
   report->key = {digest, is_read ? report->key->bits : 0, true};
 }
 
-// A doubt counts as refused for whoever is strict.
+// Under --strict a doubt counts as a refusal.
 void AddWarnings(const std::vector<Reason>& warnings, const JudgeOptions& options, Report* report) {
   for (const Reason& warning : warnings) {
     if (options.is_strict && warning.cause->severity == Severity::kDoubt) {

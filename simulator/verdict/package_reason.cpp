@@ -157,7 +157,7 @@ Reason WhyManifestRefused(const Lines& errors, const JarSignatureFacts& jar) {
   return {has_none ? &cause::kManifestDigest : &cause::kManifestChanged, ""};
 }
 
-// What is missing or cannot be extracted, the tool does not mention.
+// The tool logs nothing about an entry that is missing or cannot be extracted.
 Reason WhySilentlyRefused(const PackageFacts& facts) {
   const JarSignatureFacts& jar = facts.jar;
   if (facts.archive_result != 0) return {&cause::kDamagedArchive, ""};

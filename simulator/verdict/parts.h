@@ -17,8 +17,8 @@ Reason WhyRefused(const RunRecord& run, const PackageFacts& facts);
 // when there was no reason not to.
 Reason WhyNotLookedAt(const RunRecord& run, const PackageFacts& facts);
 
-// What an archive without AndroidManifest.xml is, where it was hardly meant for a JAR; a null cause
-// for what may be one.
+// The reason for an archive without AndroidManifest.xml that was hardly meant for a JAR; a null
+// cause for one that may be a JAR.
 Reason WhyTakenForAJar(const PackageFacts& facts);
 
 // Why the kernel did not sign the file; a null cause when it did.
@@ -43,7 +43,8 @@ bool IsJarSigner(const PublicKey& key, const Report& report);
 std::vector<Reason> FindWarnings(const RunRecord& run, const PackageFacts& facts,
                                  const Report& report, int64_t now = 0);
 
-// What a package's signature protects, by bytes. `items` are the report's, the package's own first.
+// The parts of a package that its signature protects, in bytes. `items` are the report's, the
+// package's own first.
 Protection FindProtection(const PackageFacts& facts, const std::vector<Item>& items);
 
 // The chain from the key to the entries. It breaks where the cause says for which the package

@@ -1,4 +1,4 @@
-// What a package's signature protects.
+// The parts of a package that its signature protects.
 #include <algorithm>
 #include <map>
 #include <string>

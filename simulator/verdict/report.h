@@ -1,5 +1,5 @@
-// What came of one file: the one structure from which the text, the journal's last event and any
-// other form of it are made. Plain data, computed once by MakeReport (make_report.h).
+// The result for one file: the one structure from which the text, the journal's last event and all
+// other forms are made. Plain data, computed once by MakeReport (make_report.h).
 #pragma once
 
 #include <cstdint>
@@ -117,7 +117,7 @@ struct Report {
   uint64_t file_size = 0;
   std::string file_sha256;  // in lower-case hexadecimal; empty: not known
   ToolIdentity tool;
-  std::vector<Link> chain;  // empty for what is no package
+  std::vector<Link> chain;  // empty for a file that is not a package
 
   Events events;  // all that happened, in order
 };
@@ -126,7 +126,7 @@ struct Report {
 const Item* DecisiveItem(const Report& report);
 
 // A signer for whom the newest of the phones that take the package install it, and who is not the
-// JAR's; null if there is none. Of the report the signer and the key are filled.
+// JAR's; null if all are the JAR's. Of the report the signer and the key are filled.
 const CertificateFacts* OtherSigner(const Judgement& judgement, const Report& report);
 
 // The exit status that a verdict stands for.

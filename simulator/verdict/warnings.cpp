@@ -1,4 +1,4 @@
-// What is worth a second look.
+// The warnings: facts that deserve a second look.
 #include <algorithm>
 #include <ctime>
 
@@ -53,7 +53,7 @@ bool IsJarSigner(const PublicKey& key, const Report& report) {
 
 namespace {
 
-// What others read of the package is not what the tool reads.
+// Other readers of the package find another signer or name than the tool.
 void WarnOfTwoFaces(const PackageFacts& facts, const Report& report, Reasons* warnings) {
   const JarSignatureFacts& jar = facts.jar;
   if (report.key && jar.certificate) {

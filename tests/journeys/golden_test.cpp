@@ -38,7 +38,7 @@ std::string TestName(const testing::TestParamInfo<const char*>& package) {
   return name;
 }
 
-// What the kernel and libzu get is what openssl says of the signer's certificate.
+// The kernel and libzu get the values that openssl finds in the signer's certificate.
 TEST_P(GoldenPackage, IsSignedWithItsLibrariesAndRegistered) {
   const std::string folder = Golden(GetParam());
   const std::string apk = folder + "/base.apk";
@@ -69,7 +69,7 @@ INSTANTIATE_TEST_SUITE_P(By, GoldenPackage,
                                          "openssl-cms-md5", "openssl-cms-keyid"),
                          TestName);
 
-// What a command line says of the package, whose folder it gets as $0.
+// The output of a command line about the package, whose directory it gets as $0.
 std::string Told(const std::string& name, const std::string& command) {
   const ProcessResult run = RunProcess({"sh", "-c", command, Golden(name)});
   EXPECT_EQ(run.status, 0) << run.errors;

@@ -1,5 +1,5 @@
-// What the phones' installer makes of a package, beside what the tool made of it: real packages,
-// and the lines that a person is told of them.
+// The judgement of the phones' installer beside the tool's: real packages, and the lines that a
+// person reads about them.
 #include <gtest/gtest.h>
 
 #include <nlohmann/json.hpp>
@@ -217,7 +217,7 @@ with zipfile.ZipFile("base.apk", "a") as archive:
   EXPECT_EQ(run.output.substr(0, 17), "NOT INSTALLABLE  ") << run.output << run.errors;
 }
 
-// There is no java either, and nobody misses it.
+// Java is missing, too, and no line says so.
 TEST(Installer, IsNotAskedAboutAJar) {
   const TempDir folder;
   const ProcessResult made = RunProcess(

@@ -39,7 +39,8 @@ void SetAttribute(const std::string& path, const std::string& value) {
   ASSERT_EQ(setxattr(path.c_str(), "user.zu", value.data(), value.size(), 0), 0) << strerror(errno);
 }
 
-// What a JAR is registered with: four digests, the first of its path, each other of the one before.
+// The key block that a JAR is registered with: four digests, the first of its path, each other of
+// the one before.
 Bytes KeyBlock(const std::string& path) {
   Bytes block(4 * SHA256_DIGEST_LENGTH);
   SHA256(reinterpret_cast<const uint8_t*>(path.data()), path.size(), &block[0]);
@@ -197,7 +198,7 @@ TEST(Jar, TamperedSignatureDoesNotMatterToOneThatIsTrusted) {
   EXPECT_EQ(run.status, 0);
 }
 
-// What follows when the zip library refuses the file.
+// The log lines that follow when the zip library refuses the file.
 std::string NotAnArchive(const std::string& path, const std::string& reason) {
   return Timeline({Log(6, "OpenArchiveFd(3) [file: " + path + "] returned: " + reason + "\n"),
                    Log(4, "VeltSignJni starts: 3.\n"),

@@ -54,7 +54,7 @@ class RefusedPackage : public testing::Test {
     EXPECT_EQ(run.status, 1);
   }
 
-  // The library is not there, which is no refusal; the package is signed and registered.
+  // The library is missing, which is not a refusal; the package is signed and registered.
   void ExpectLibraryAbsentAfter(std::initializer_list<std::string> reasons) const {
     ExpectGoodPackageWith(Timeline(reasons), 0);
   }

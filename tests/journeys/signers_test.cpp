@@ -68,7 +68,7 @@ TEST(SignerIdentifier, MayBeTheCertificatesKeyIdentifier) {
   }
 }
 
-// The line of that beginning; empty when there is none.
+// The line of that beginning; empty when no line has it.
 std::string LineWith(const std::string& text, const std::string& part) {
   std::istringstream lines(text);
   for (std::string line; std::getline(lines, line);) {
@@ -82,7 +82,7 @@ TEST(Schemes, AreThoseThatTheFileCarries) {
   EXPECT_EQ(LineWith(Told("jarsigner-sha256"), "schemes:"), "    schemes: v1");
 }
 
-// What the kernel gets of the key is another digest than the one that is printed everywhere else.
+// The kernel gets another digest of the key than the one that other programs print.
 TEST(KernelsDigest, IsThatOfTheModulusAlone) {
   const ProcessResult modulus = RunProcess({"cat", Golden("apksigner-sha256-2048/digest")});
   EXPECT_EQ(LineWith(Told("apksigner-sha256-2048"), "modulus SHA-256") + "\n",

@@ -56,8 +56,8 @@ Package SignedAgain(Package package, Certificate certificate, const OwnKey& key)
 }
 
 // The certificate shows the victim's modulus. An exponent of eight bytes makes the tool read on
-// behind it for 300 bytes in all, up to such of an extension that the number is a prime: whoever
-// wrote it can sign for it.
+// behind it for 300 bytes in all, up to such of an extension that the number is a prime: its author
+// can sign for it.
 Package WithAPrimeBehindTheVictimsModulus(std::string* digest) {
   constexpr size_t kSize = 300;
   Certificate certificate;

@@ -25,10 +25,10 @@ ProcessResult Call(Words command, const Words& more, const std::string& director
   return RunProcess(command, directory);
 }
 
-// What the phone's kernel says, which these options of the simulator describe.
+// The answer of the phone's kernel, which these options of the simulator describe.
 ProcessResult Verify(const Words& words) { return Call({SimulatorPath(), "--verify"}, words); }
 
-// What the program says where there is no simulation.
+// The program's answer without a simulation.
 ProcessResult VerifyHere(const Words& words, const std::string& directory = {}) {
   return Call({VerifyPath()}, words, directory);
 }
@@ -119,8 +119,7 @@ TEST(Verify, WhatMayNotBeReadCannotBeOpened) {
                file + ": cannot be opened (errno 13, EACCES)\n");
 }
 
-// A FIFO keeps nobody waiting, and whatever the kernel says of it or of a device counts for
-// nothing.
+// A FIFO does not make the program wait. The kernel's answer for a FIFO or a device does not count.
 TEST(Verify, WhatIsNoRegularFileIsNotTrusted) {
   const TempDir folder;
   const std::string fifo = folder / "fifo";

@@ -82,7 +82,7 @@ TEST(ExitStatus, ThreeWhenTheVerifierDoesNotEnd) {
   EXPECT_EQ(result.status, 3);
 }
 
-// Whoever reads a pipe waits for a writer, and a device has no end: neither is read to remember it.
+// Reading a pipe waits for a writer, and a device has no end. Neither is read to remember it.
 TEST(ExitStatus, OneForADeviceOrAPipe) {
   const TempDir folder;
   const std::string pipe = folder / "pipe";
@@ -145,7 +145,7 @@ TEST(ExitStatus, ThreeWhenTheToolIsNoProgram) {
 TEST(ExitStatus, ThreeWhenTheStandInsAreNotInTheTool) {
   if (AreProgramsEmulated()) GTEST_SKIP() << "the emulator hides that a program does not start";
   const TempDir folder;
-  // What the loader would be told is lost on the way.
+  // The settings for the loader are lost on the way.
   const std::string tool = folder.Write("tool", ToBytes("#!/usr/bin/env -S -u LD_PRELOAD true\n"));
   ASSERT_EQ(chmod(tool.c_str(), 0755), 0);
   const ProcessResult result =
@@ -205,7 +205,8 @@ TEST(ExitStatus, ThreeWhenThePageIsAPipeThatNobodyReads) {
   EXPECT_EQ(read.output.substr(read.output.size() - 8), "</html>\n");
 }
 
-// Whatever was laid out is no use: the file system, and not the package, is in the way.
+// The fault lies in the file system and not in the package, so the run says nothing about the
+// package.
 TEST(ExitStatus, ThreeWhenLibrariesCannotBeWritten) {
   const TempDir folder;
   const std::string file = folder / "base.apk";

@@ -13,7 +13,7 @@ using namespace simulator;
 
 namespace {
 
-// What the options are after this command line; it must be a good one.
+// The options after this command line, which must be a valid one.
 Options Parsed(Lines words) {
   Options options;
   words.insert(words.begin(), "apktoolkit-sim");

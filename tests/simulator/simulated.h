@@ -28,8 +28,8 @@ inline Lines FirstLines(const ProcessResult& result, size_t count) {
   return lines;
 }
 
-// What the shell makes of a command line: `script`, in which "$@" is the simulator with the probe
-// as its tool.
+// Runs a command line in the shell: `script`, in which "$@" is the simulator with the probe as its
+// tool.
 inline ProcessResult InShell(const std::string& script, const Lines& words) {
   Lines command = {"bash", "-c", script, "bash", SimulatorPath(), "--tool", PROBE_PATH};
   command.insert(command.end(), words.begin(), words.end());

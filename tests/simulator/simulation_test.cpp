@@ -1,4 +1,4 @@
-// What apktoolkit-sim does with its files, its journal and its page.
+// apktoolkit-sim and its files, its journal and its page.
 #include <gtest/gtest.h>
 #include <sys/stat.h>
 #include <unistd.h>
@@ -12,7 +12,7 @@
 
 namespace {
 
-// What stands behind such a JAR in the line of the verdict.
+// The text behind such a JAR in the line of the verdict.
 constexpr char kNotTrusted[] =
     "   it is a plain JAR, and those are signed only when the kernel trusts them already (ENOKEY: "
     "Required key not available)";
@@ -62,7 +62,7 @@ TEST(Files, KeepTheirOrderWhenSeveralRunAtATime) {
   EXPECT_EQ(started, files);
 }
 
-// Whoever looks at a pipe sees no line that is overwritten.
+// A pipe gets no line that would be overwritten.
 TEST(Files, ShowNoProgressWithoutATerminal) {
   const Probe slow({"sign 3 0000", "sleep 2"});
   EXPECT_EQ(Simulated({slow.path()}).errors, "");
@@ -153,7 +153,7 @@ TEST(Interruption, IsNoneByASignalThatTheCallerIgnores) {
   EXPECT_EQ(result.status, 0);
 }
 
-// Names may come from whoever made the files.
+// The author of a file chooses the names in it.
 TEST(Files, NamesReachNoTerminalAsTheyAre) {
   const TempDir folder;
   const std::string odd = folder.Write("-\x1b]0;x\x07", ToBytes("sign 3 0000\n"));
@@ -217,7 +217,7 @@ TEST(Page, IsWrittenAnewForAllFilesInTheirOrder) {
   EXPECT_TRUE(first < second && second < third && third != std::string::npos) << text;
 }
 
-// What shows a journal to a person is not deceived by it.
+// A journal does not deceive a person who looks at it.
 TEST(Journal, HasNoHiddenCharacters) {
   const TempDir folder;
   const std::string odd = folder.Write("\u0085\u202e\u200b", ToBytes("sign 3 0000\n"));
@@ -340,7 +340,7 @@ TEST(Simulation, TellsThatTheFileWasChangedMeanwhile) {
   const std::string changed = "   ! it was changed while it was looked at";
   EXPECT_NE(Told({"--quiet", "--runner", runner, file}).output.find(changed), std::string::npos);
   EXPECT_EQ(Told({"--quiet", file}).output.find(changed), std::string::npos);
-  // What the tool could not open, nobody changed.
+  // A file that the tool could not open does not count as changed.
   EXPECT_EQ(Told({"--quiet", folder.path()}).output.find(changed), std::string::npos);
 }
 

@@ -19,7 +19,7 @@ XmlAttribute Boolean(const std::string& name, bool value) {
 
 constexpr CompiledXml::Pool kPools[] = {CompiledXml::Pool::kUtf8, CompiledXml::Pool::kUtf16};
 
-// What is read of a manifest whose application has these attributes.
+// The value that is read from a manifest whose application has these attributes.
 std::optional<bool> Extracts(const std::vector<XmlAttribute>& attributes,
                              CompiledXml::Pool pool = CompiledXml::Pool::kUtf8) {
   CompiledXml xml(pool);
@@ -106,7 +106,7 @@ TEST(AndroidManifestFacts, WhetherLibrariesAreExtracted) {
   }
 }
 
-// What an installer reads as a number is a truth value to it.
+// An installer takes a number for a truth value.
 TEST(AndroidManifestFacts, LibrariesAreExtractedForAnyNumberButZero) {
   EXPECT_EQ(Extracts({IntAttribute("extractNativeLibs", 0)}), false);
   EXPECT_EQ(Extracts({IntAttribute("extractNativeLibs", 7)}), true);

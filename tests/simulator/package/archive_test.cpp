@@ -185,7 +185,7 @@ TEST(ArchiveEnd, IsTheLastMarkThatHasRoomForARecord) {
   EXPECT_EQ(end_of(""), 1);
   EXPECT_EQ(end_of("a comment"), 1);
   EXPECT_EQ(end_of(std::string(65535, 'c')), 1);
-  // A mark in the comment that no record follows is no end.
+  // A mark in the comment does not count as the end when no record follows it.
   EXPECT_EQ(end_of(std::string("PK\5\6") + std::string(17, '\0')), 1);
   // With one behind it the platform's library takes it for the end, and so is it taken here.
   EXPECT_EQ(end_of(std::string("PK\5\6") + std::string(18, '\0')), 0);

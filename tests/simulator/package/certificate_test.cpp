@@ -16,7 +16,7 @@ std::string_view View(const Bytes& bytes) {
   return {reinterpret_cast<const char*>(bytes.data()), bytes.size()};
 }
 
-// What a shell command prints of the certificate, which it finds in the file $0.
+// The output of a shell command about the certificate, which it finds in the file $0.
 std::string Told(const Bytes& certificate, const std::string& command) {
   const DiskFile file(certificate);
   const ProcessResult run = RunProcess({"bash", "-o", "pipefail", "-c", command, file.path()});
@@ -123,7 +123,7 @@ TEST(CertificateFacts, CutCertificateHasNone) {
   }
 }
 
-// What its signature is made with stands twice; the one that counts is not signed itself.
+// The certificate names its signature's algorithm twice. The one that counts is not signed itself.
 TEST(CertificateFacts, AlgorithmIsThatOfTheSignature) {
   Certificate certificate = Of("rsa-2048");
   certificate.tbs_algorithm = AlgorithmIdentifier(RsaSignatureOid(Digest::kSha1));

@@ -190,7 +190,7 @@ TEST(PackageFacts, EachListedEntryIsComparedWithItsDigest) {
   EXPECT_EQ(with(late, EntryDigest::kNotCompared).size(), 5U);
 }
 
-// What lies below a directory of META-INF is an entry like others.
+// An entry in a directory below META-INF is an entry like others.
 TEST(PackageFacts, SignatureFilesLieInMetaInfItself) {
   Package package = MakePackage();
   for (const char* name :

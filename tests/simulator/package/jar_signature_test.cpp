@@ -1,4 +1,4 @@
-// What is read of a JAR signature: by the tool's own code, and as others read it.
+// The facts of a JAR signature: by the tool's own code, and as others read it.
 #include <gtest/gtest.h>
 
 #include <algorithm>
@@ -91,11 +91,11 @@ TEST(ToolKey, OfAnEcKeyIsNone) {
   EXPECT_EQ(jar.certificate->key.algorithm, "EC");
 }
 
-// What a strict reader takes for the certificate has to be where the tool read its key.
+// A strict reader must find the certificate at the place where the tool read the key.
 TEST(JarSignatureFacts, CertificateThatTheToolDoesNotReadIsNotShown) {
   Package package = MakePackage();
   Bytes& block = package.Item("META-INF/CERT.RSA").data;
-  // The length of the certificates, in four bytes and then not minimal, is no DER.
+  // The length of the certificates takes four bytes and is not minimal, which DER forbids.
   const JarSignatureFacts before = SignatureOf(package);
   ASSERT_TRUE(before.certificate.has_value());
   ASSERT_TRUE(before.block.is_whole);

@@ -91,7 +91,7 @@ TEST(SigningBlock, SignersBeyondReasonAreNotRead) {
 
 namespace {
 
-// What is read of an archive with this in front of its central directory.
+// The result for an archive with this in front of its central directory.
 std::string ReadFrom(const Bytes& block, const std::string& comment = "",
                      bool expect_too_large = false) {
   const MemoryFile file(ArchiveWithBlock(BuildZip({{"a", ToBytes("data")}}), block, comment));

@@ -149,7 +149,8 @@ TEST(KernelStandIn, KeepsItsDescriptorsHighAndToItself) {
   // The probe has its script at 3 and its results at 4.
   EXPECT_EQ(run.results[0], "5 77");
   EXPECT_EQ(run.results[5], "6 77");
-  // What a program that the tool turns into would find open is what it would find on its own.
+  // A program that the tool turns into by exec finds the same descriptors open as without the
+  // simulation.
   const std::string inherited = run.results[6];
   RunProcess({PROBE_COMMAND, probe.path()});
   EXPECT_EQ(inherited, LinesOf(ContentOf(probe.path() + ".out")).back());

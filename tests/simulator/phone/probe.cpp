@@ -22,7 +22,7 @@
 #include "sign/libzu.h"
 #include "simulator/phone/log_library.h"
 
-// What fcntl becomes in programs that are built for large files.
+// Programs that are built for large files call fcntl by this name.
 extern "C" int fcntl64(int, int, ...);
 
 namespace {
@@ -71,7 +71,7 @@ const void* Memory(const std::string& word) {
   return bytes.data();
 }
 
-// What the file says, and nothing is left open.
+// Reads the number in the file and closes it.
 long ReadAndClose(FILE* file) {
   unsigned value = 0;
   if (file == nullptr) return -1;

@@ -34,7 +34,7 @@ class Probe {
 // Only those of `events` that are of this kind.
 std::vector<Json> OfKind(const std::vector<Json>& events, const std::string& kind);
 
-// One JSON object for each line of `journal`; a line that is none is a test failure.
+// One JSON object for each line of `journal`; another line is a test failure.
 std::vector<Json> ParseJournal(const std::string& journal);
 
 Lines LinesOf(const std::string& text);

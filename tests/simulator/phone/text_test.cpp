@@ -8,7 +8,7 @@ using namespace simulator;
 
 namespace {
 
-// What a JSON reader of another's making sees.
+// The text as an independent JSON reader sees it.
 std::string ReadBack(const std::string& bytes) {
   return Json::parse(EncodeText(bytes)).get<std::string>();
 }
@@ -34,7 +34,7 @@ TEST(JournalText, Utf8StaysAsItIs) {
   }
 }
 
-// Whoever prints a journal on a terminal is not deceived; a JSON reader sees no difference.
+// A journal on a terminal does not deceive the eye; a JSON reader sees no difference.
 TEST(JournalText, HiddenCharactersAreEscaped) {
   EXPECT_EQ(EncodeText("\u0080\u009f\u00ad\u061c\u180e"), R"("\u0080\u009f\u00ad\u061c\u180e")");
   EXPECT_EQ(EncodeText("\u200b\u200f\u2028\u202e\u2060\u206f"),

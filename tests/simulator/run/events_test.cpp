@@ -32,7 +32,7 @@ TEST(Events, NumbersAreWholeOrNotThere) {
   EXPECT_EQ(NumberOf(Json::parse(R"({})"), "a"), 0);
 }
 
-// An answer that is not there is none that is good.
+// A missing answer does not count as success.
 TEST(Events, SuccessIsTheResultZero) {
   EXPECT_TRUE(IsSuccess(Json::parse(R"({"result":0})")));
   EXPECT_FALSE(IsSuccess(Json::parse(R"({"result":-1})")));

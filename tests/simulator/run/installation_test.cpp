@@ -71,7 +71,8 @@ TEST(Installation, TakesTheProcessorsThatAreAskedFor) {
   EXPECT_EQ(LaidOut(kBoth, InstalledAbi::kArm64), Files({"lib/arm64/liba.so 64"}));
   EXPECT_EQ(LaidOut(kBoth, InstalledAbi::kArm), Files({"lib/arm/liba.so 32"}));
   EXPECT_EQ(LaidOut({kBoth[2]}, InstalledAbi::kAll), Files({"lib/arm/liba.so old"}));
-  // Of two ABIs for one processor, the second is left alone, whatever its libraries are called.
+  // Of two ABIs for one processor, the second is left alone, even when its libraries have other
+  // names.
   EXPECT_EQ(LaidOut({kBoth[1], {"lib/armeabi/libb.so", ToBytes("old")}}, InstalledAbi::kAll),
             Files({"lib/arm/liba.so 32"}));
 }
@@ -287,7 +288,7 @@ TEST(Installation, SaysWhenThereIsNoPlaceForIt) {
   EXPECT_TRUE(problem.has_value());
 }
 
-// What is written when an interruption comes is not waited for: however much time is left.
+// An interruption ends the writing at once, even when time is left.
 TEST(Installation, EndsWhenTheProcessIsToEnd) {
   const TempDir folder;
   const std::string file = folder / "base.apk";

@@ -82,7 +82,7 @@ TEST(LogLine, OtherTextsAreUnknown) {
   }
 }
 
-// Names come from whoever made the file.
+// The author of a file chooses the names in it.
 TEST(LogLine, TextInANameMakesNoOtherLine) {
   const LogLine path =
       ReadLogLine("OpenArchiveFd(3) [file: /a] returned: -6: x\n] returned: -3: Invalid file\n");

@@ -34,7 +34,7 @@ RunRecord Record(Events events) {
   return TakeApart(events);
 }
 
-// What the kernel signed: "own", and the paths of libraries.
+// The files that the kernel signed: "own", and the paths of libraries.
 Lines SignedBy(const Events& events) {
   const RunRecord record = Record(events);
   Lines lines;

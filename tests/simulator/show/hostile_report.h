@@ -8,8 +8,8 @@
 
 namespace simulator {
 
-// What such a file would bring: markup for every place of a page, what a terminal obeys, bytes that
-// are no UTF-8, characters that turn the direction of writing, and marks of the page's template.
+// The texts of a hostile file: markup for every place of a page, control sequences, bytes that are
+// not UTF-8, characters that turn the direction of writing, and marks of the page's template.
 inline const char kHostileText[] =
     "</title></style><script>document.title='hostile'</script><img src=x onerror=alert(1)>"
     "\"'><a href='javascript:alert(1)'>&lt;&{{verdict}}{{{verdict}}}{{&verdict}}-->"

@@ -198,7 +198,8 @@ TEST(VerdictEvent, EveryStateOfALinkHasACode) {
   EXPECT_EQ(chain[2]["state"], "not-reached");
 }
 
-// Of the JAR signature it is the key that the kernel got, whatever the certificate shows.
+// The key of the JAR signature is the one that the kernel got, even when the certificate shows
+// another.
 TEST(VerdictEvent, KeyThatNoCertificateShowsIsTold) {
   Report report;
   report.key = {"ab", 2048, true};

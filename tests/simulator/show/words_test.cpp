@@ -111,7 +111,7 @@ TEST(HeadFacts, HaveTheReasonInPlaceOfTheSigner) {
   EXPECT_EQ(HeadFacts(report, "..."), Lines({"libzu answered 7"}));
 }
 
-// What the tool refused besides is not why phones do not install it.
+// The tool's other refusals are not the reason why phones do not install it.
 TEST(HeadFacts, HaveTheInstallersReasonWhereTheVerdictIsHis) {
   Report report = WithSigner();
   report.verdict = Verdict::kNotInstallable;

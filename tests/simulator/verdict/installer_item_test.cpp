@@ -28,7 +28,7 @@ Judgement Judged(const std::vector<RangeJudgement>& ranges) {
   return {Judgement::State::kJudged, "", ranges};
 }
 
-// The item's code and text; empty if there is none.
+// The item's code and text; empty if no item was added.
 std::string Told(const Judgement& judgement) {
   std::vector<Item> items;
   AddInstallerItem(judgement, {}, &items);

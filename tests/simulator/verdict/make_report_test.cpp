@@ -72,7 +72,7 @@ Lines Items(const Events& events, const PackageFacts& facts = {}) {
   return ItemsOf(Made(events, facts));
 }
 
-// What the tool logs while it takes up one file for the kernel.
+// The tool's log lines while it takes up one file for the kernel.
 const Json kTakesUp = Log(4, "VeltSignOat: Apk case.\n");
 const Json kLibrariesStart = Log(4, "VeltSignJni starts: 3.\n");
 const Json kFileStart = Log(4, "VeltSign starts: zip_fd = 3, fd = 3.\n");
@@ -81,7 +81,7 @@ Json CannotSign(int error) {
   return Log(6, "VELT can't sign a file (result=10000, errno " + std::to_string(error) + ": x).\n");
 }
 
-// What can be seen of a package with these libraries, each as opening it ends.
+// The facts of a package with these libraries; opening each gives `error`.
 PackageFacts WithLibraries(const Lines& entries, int error = 0, bool has_directory = false) {
   PackageFacts facts;
   for (const std::string& name : entries) {

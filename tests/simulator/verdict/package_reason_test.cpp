@@ -148,7 +148,7 @@ TEST(WhyRefused, OfASignature) {
   facts.jar.block.digest = "SHA512";
   facts.jar.block.has_known_digest = false;
   EXPECT_EQ(Why(errors, facts), "signature-digest SHA512");
-  // A digest that was not read is none that is not known.
+  // A digest algorithm that was not read does not count as unknown.
   facts.jar.block.is_whole = false;
   EXPECT_EQ(Why(errors, facts), "signature-wrong META-INF/CERT.RSA");
   facts.jar.block.has_pss = true;

@@ -122,7 +122,7 @@ TEST(Chain, BreaksAtALibraryUnlessThePackageDoesBefore) {
             "x----");
 }
 
-// What goes wrong with the run is no matter of the signature.
+// A failure of the run does not concern the signature.
 TEST(Chain, IsNotBrokenByAnotherItem) {
   const Item tool = {ItemKind::kTool, "tool", "", ItemState::kRefused, {&cause::kToolError, "x"}};
   EXPECT_EQ(ChainOf({PackageItem(nullptr), tool}), "hhhhh");
