@@ -136,8 +136,8 @@ void Hear(std::string_view text) {
 
 }  // namespace ApkTools
 
-// The program's definition comes before the platform's, for the platform's libraries as well. What
-// is longer than a record of the log is cut, as the log would cut it.
+// The program's definition comes before the platform's, for the platform's libraries as well. A
+// text that is longer than a record of the log is cut at the same place as in the log.
 extern "C" int __android_log_print(int priority, const char* tag, const char* format, ...) {
   const int saved_errno = errno;
   char text[kLogTextSize];

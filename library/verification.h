@@ -13,7 +13,7 @@
 
 namespace ApkTools {
 
-// Why a file is no good package, in the order in which the checks are made.
+// Reasons why a file is not a good package, in the order of the checks.
 enum class Reason {
   kGood,
   kNoDescriptor,               // there is no file: the descriptor is negative
@@ -51,7 +51,8 @@ class Verification {
 
   // kGood if and only if the package's IsGoodApk() is true.
   Reason reason() const { return reason_; }
-  // What was found: package name, signer's key, entries. Never null, and gone with this object.
+  // The facts that were found: package name, signer's key, entries. Never null, and gone with this
+  // object.
   Apk& apk() { return *apk_; }
 
  private:

@@ -136,7 +136,7 @@ PublicKey ReadKey(X509* certificate) {
   return key;
 }
 
-// The library compares times, whatever their form.
+// The library compares times of both forms.
 std::optional<int64_t> SecondsOf(const ASN1_TIME* time) {
   constexpr int64_t kSecondsOfDay = 86'400;
   const bssl::UniquePtr<ASN1_TIME> start(ASN1_TIME_set(nullptr, 0));

@@ -13,7 +13,7 @@ namespace simulator {
 
 // The answer of the tool's code for an entry and its digest in the manifest.
 enum class EntryDigest {
-  kUnlisted,  // there is none
+  kUnlisted,  // the manifest has none
   kMatches,
   kDiffers,
   kNotCompared,  // the entry cannot be read or is too long, its digest is of no kind that the tool

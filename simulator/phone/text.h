@@ -26,7 +26,8 @@ std::string HexText(std::string_view bytes);
 size_t Utf8Length(std::string_view bytes);
 
 // Whether the valid UTF-8 character is one that a terminal obeys, or that has no width or turns the
-// direction of what stands around it, or that is none (U+FFFE, U+FFFF; XML does not know them).
+// direction of what stands around it, or that is a noncharacter (U+FFFE, U+FFFF, which XML
+// forbids).
 bool IsHidden(std::string_view character);
 
 // The parts of `text` between the separators; one empty part when `text` is empty.

@@ -101,8 +101,8 @@ void Walk(const std::string& root, FileList* list) {
   std::move(found.begin(), found.end(), std::back_inserter(list->files));
 }
 
-// A link to a directory is neither walked nor a file. What cannot be told to be one or the other is
-// told as a directory: its path is too long, for example.
+// A link to a directory is neither walked nor a file. An entry whose kind cannot be read counts as
+// a directory that cannot be read: its path is too long, for example.
 void AddEntry(const fs::directory_entry& entry, std::vector<std::string>* directories,
               std::vector<ListedFile>* found, size_t* others) {
   std::error_code error;

@@ -27,8 +27,8 @@ enum class InstallWhen {
   kNever,
 };
 
-// What the output has in place of the directory of an installation, which is called otherwise in
-// each run. A path of the kernel's begins with "/", so that none of a file begins like this.
+// The output has this in place of the directory of an installation, whose name differs in each run.
+// A path of the kernel's begins with "/", so that none of a file begins like this.
 inline constexpr char kInstalledDirectory[] = "<install>/";
 
 class Installation {
@@ -38,9 +38,9 @@ class Installation {
   Installation(const Installation&) = delete;
   Installation& operator=(const Installation&) = delete;
 
-  // Lays out the package at `file`. What is no package, keeps its libraries, or has none to lay
-  // out, stays where it is; so does one that does not lie alone, where `when` asks for that. None
-  // when that is done, else why it cannot be.
+  // Lays out the package at `file`. A file that is not a package, keeps its libraries, or has none
+  // to lay out, stays where it is; so does one that does not lie alone, where `when` asks for that.
+  // None when that is done, else why it cannot be.
   std::optional<std::string> LayOut(const std::string& file, InstallWhen when, InstalledAbi abi,
                                     const Deadline& deadline);
 

@@ -1,4 +1,4 @@
-// What the parts of the page share: texts as they may be shown, and lists with an end.
+// Shared by the parts of the page: texts that are fit to be shown, and lists of bounded length.
 #pragma once
 
 #include <algorithm>

@@ -14,7 +14,7 @@ using kainjow::mustache::data;
 using kainjow::mustache::list;
 using kainjow::mustache::object;
 
-// What one of them says. Each line in its cell is cut by itself.
+// The judgement of one of the two. Each line in its cell is cut by itself.
 struct Said {
   std::string who;
   Mark mark;

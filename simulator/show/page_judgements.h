@@ -7,7 +7,7 @@
 
 namespace simulator {
 
-// Sets the sections of the table. It is empty for what is no package.
+// Sets the sections of the table. It is empty for a file that is not a package.
 void AddJudgements(const Report& report, kainjow::mustache::data* file);
 
 }  // namespace simulator

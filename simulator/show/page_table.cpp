@@ -93,7 +93,7 @@ std::string CommonDirectory(const std::vector<std::string>& files) {
   if (files.empty()) return {};
   std::string_view common = files[0];
   for (const std::string& file : files) {
-    // Something is left of each, whatever it ends in.
+    // A part of each name is left, even if it ends with "/".
     const size_t most = std::min(common.size(), file.empty() ? 0 : file.size() - 1);
     size_t size = 0;
     while (size < most && common[size] == file[size]) ++size;

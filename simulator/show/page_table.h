@@ -35,8 +35,8 @@ class PageTable {
   std::vector<Row> rows_;
 };
 
-// The directory that all of these lie in by their names, with its "/" at the end; empty if there is
-// none, or none but "/".
+// The directory that all of these lie in by their names, with its "/" at the end; empty if they
+// share no directory but "/".
 std::string CommonDirectory(const std::vector<std::string>& files);
 
 }  // namespace simulator

@@ -1,5 +1,5 @@
-// What the command line demands of each file beside what the phone makes of it: whose it must be,
-// and that there is nothing to warn of.
+// The demands of the command line on each file, beside the phone's answer: its signer, and that it
+// has no warnings.
 #pragma once
 
 #include <map>

@@ -19,7 +19,7 @@ std::string Golden(const std::string& name) { return std::string(GOLDEN_PACKAGES
 
 std::string Apk(const std::string& name) { return Golden(name) + "/base.apk"; }
 
-// What a shell command prints, without its line end; $0 is the certificate of the test key.
+// The output of a shell command, without its line end; $0 is the certificate of the test key.
 std::string OfCertificate(const std::string& key, const std::string& command) {
   const ProcessResult run =
       RunProcess({"bash", "-o", "pipefail", "-c", command, Golden(key + ".pem")});

@@ -27,7 +27,7 @@ class ManyFiles : public testing::Test {
     folder_.Write("shop/notes.txt", ToBytes("notes"));
   }
 
-  // What the shell makes of it; "sim" is the simulator.
+  // Runs it in the shell, where "sim" is the simulator.
   ProcessResult Do(const std::string& script, const Lines& before = {}) const {
     Lines command = before;
     command.insert(
@@ -78,7 +78,7 @@ TEST_F(ManyFiles, DirectoryWithoutRecursiveIsRefusedWithTheCure) {
             std::string::npos);
 }
 
-// Nothing was looked at there, and that is no success.
+// The tool looked at nothing there, so the run must fail.
 TEST_F(ManyFiles, DirectoryWithoutPackagesIsNoSuccess) {
   fs::create_directory(folder_ / "empty");
   EXPECT_EQ(Told(Do("sim --recursive good empty --journal journal")),

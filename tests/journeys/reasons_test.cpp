@@ -161,7 +161,7 @@ TEST_F(Reason, DsaKey) {
                             "-> 1"}));
 }
 
-// Whoever follows the cure has to know what it costs.
+// The cure tells its cost.
 TEST_F(Reason, AnotherKeyIsAnotherSignerAndRotationDoesNotHelp) {
   for (const char* name : {"apksigner-ec", "apksigner-5120"}) {
     Do("rm -rf -- *");
@@ -457,7 +457,7 @@ TEST_F(Reason, LibrariesOfAnotherProcessorAreNotLaidOut) {
   EXPECT_EQ(Told(4, {"--install=all", "--strict"}).back(), "-> 0");
 }
 
-// What was asked for and is not there stays a refusal.
+// A library that was asked for and is missing stays a refusal.
 TEST_F(Reason, StrictRefusesALibraryThatNoInstallerTakes) {
   MakePackage(WithLibraries({{"lib/arm64-v8a/libx.so", ToBytes("x")},
                              {"lib/arm64-v8a/sub/liby.so", ToBytes("y")}}))

@@ -20,8 +20,8 @@ using ApkTools::Verification;
 
 namespace {
 
-// What the file is refused for. The parser of signature blocks prints to standard output, and the
-// log to standard error; neither is of interest.
+// The reason why the file is refused. The parser of signature blocks prints to standard output, and
+// the log to standard error; neither is of interest.
 Reason ReasonOf(const Bytes& content) {
   const MemoryFile file(content);
   testing::internal::CaptureStdout();

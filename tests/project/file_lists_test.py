@@ -55,7 +55,7 @@ MODULES = {
                             for room in ROOMS if room != "verify"}},
     "fuzz/cc_fuzz.bp": {"apktoolkit_fuzz_support": ["fuzz:fuzz_support"]},
 }
-# What a module has besides: CMake has these in libraries of their own.
+# More sources of a module. CMake has these in libraries of their own.
 MORE = {"apktoolkit_sign_test": ["tests/support/phone.cpp"]}
 
 FIX = f"the lists and tables at the head of {__file__}, or the file that is named above"

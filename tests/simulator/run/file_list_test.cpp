@@ -17,7 +17,7 @@ namespace fs = std::filesystem;
 using Lines = std::vector<std::string>;
 
 // The names of the list without the directory, each directory with why the tool is not run for it;
-// or the one line why there is no list.
+// or one line that says why listing failed.
 Lines Listed(const TempDir& directory, const FileListOptions& options, size_t* others = nullptr) {
   FileList list;
   if (const auto problem = ListFiles(options, &list)) return {*problem};

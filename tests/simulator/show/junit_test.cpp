@@ -31,7 +31,7 @@ std::string XmlOf(const std::vector<Report>& reports) {
   return junit.Xml();
 }
 
-// What Python's reader of XML finds: of each element its name, its attributes and its text.
+// The elements as Python's reader of XML finds them: of each its name, its attributes and its text.
 std::string ReadByPython(const std::string& xml) {
   const DiskFile file({xml.begin(), xml.end()});
   const ProcessResult run = RunProcess({"python3", "-c", R"(

@@ -99,7 +99,8 @@ TEST(Sarif, RulesAndFilesStandOnce) {
   EXPECT_EQ(ResultsOf(log), Lines(4, "error tool-error b.apk"));
 }
 
-// Whoever counts results finds an error, and whoever looks at the run finds that it failed.
+// A reader that counts results finds an error, and a reader that looks at the run finds that it
+// failed.
 TEST(Sarif, FileThatWasNotJudgedIsAnErrorAndTheRunWasNotSuccessful) {
   for (const Verdict verdict : {Verdict::kNotLookedAt, Verdict::kNotSimulated}) {
     Report report;

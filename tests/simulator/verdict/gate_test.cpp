@@ -56,7 +56,7 @@ Lines Added(const Report& before, const Report& after) {
   return codes;
 }
 
-// What becomes of one file where these signers are expected.
+// The result for one file where these signers are expected.
 struct Judged {
   Lines codes;
   Verdict verdict;
