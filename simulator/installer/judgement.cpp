@@ -22,16 +22,16 @@ const Json* ListOf(const Json& json, const char* key);
 
 Judgement ParseJudgement(const std::string& line) {
   const Json answer = Json::parse(line, nullptr, false);
-  if (!answer.is_object()) return NoAnswer("its answer does not read");
+  if (!answer.is_object()) return NoAnswer("its answer is malformed");
   const std::string failure = TextOf(answer, "failure");
   if (!failure.empty()) return NoAnswer(failure);
   const Json* const ranges = ListOf(answer, "ranges");
-  if (ranges == nullptr || ranges->empty()) return NoAnswer("its answer does not read");
+  if (ranges == nullptr || ranges->empty()) return NoAnswer("its answer is malformed");
   Judgement judgement;
   judgement.state = Judgement::State::kJudged;
   for (const Json& each : *ranges) {
     RangeJudgement range;
-    if (!ReadRange(each, &range)) return NoAnswer("its answer does not read");
+    if (!ReadRange(each, &range)) return NoAnswer("its answer is malformed");
     judgement.ranges.push_back(std::move(range));
   }
   return judgement;

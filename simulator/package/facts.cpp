@@ -181,7 +181,7 @@ void ReadNewerSigners(int fd, PackageFacts* facts) {
   const auto end = FindArchiveEnd(fd);
   bool is_too_large = false;
   const std::string bytes = end ? ReadSigningBlock(fd, *end, &is_too_large) : std::string();
-  if (is_too_large) facts->too_long.push_back("the block of the schemes after v1");
+  if (is_too_large) facts->too_long.push_back("the signing block (v2 and later)");
   const SigningBlock block = ParseSigningBlock(bytes);
   facts->has_damaged_signing_block = block.is_damaged;
   for (const NewerSigner& signer : block.signers) {

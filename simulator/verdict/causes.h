@@ -55,16 +55,18 @@ namespace cause {
 // ---- The tool did not look at the file.
 inline constexpr Cause kFileMissing = {"file-missing", Group::kNotLookedAt, Severity::kUnseen,
     ChainLink::kKey, "", "there is no such file",
-    "Check the name; a relative one counts from the folder in which the tool is run."};
+    "Check the name; a relative one counts from the directory in which the tool is run."};
 inline constexpr Cause kFileNoPermission = {"file-no-permission", Group::kNotLookedAt,
     Severity::kUnseen, ChainLink::kKey, "", "it may not be read",
-    "Give the user who runs the tool the right to read the file and to enter its folders."};
+    "Give the user who runs the tool the right to read the file and to enter its "
+    "directories."};
 inline constexpr Cause kFileNotOpened = {"file-not-opened", Group::kNotLookedAt, Severity::kUnseen,
     ChainLink::kKey, "", "it cannot be opened (%s)", "Fix the reported error, and run again."};
 inline constexpr Cause kReadOnlyFileSystem = {"read-only-file-system", Group::kNotLookedAt,
     Severity::kUnseen, ChainLink::kKey, "",
     "it lies on a read-only file system, where the tool leaves every file alone",
-    "Nothing, for a file of the system image. Any other: copy it to where it can be written."};
+    "Nothing to do for a file of the system image. Copy any other file to a file system that can "
+    "be written."};
 inline constexpr Cause kStandardInputClosed = {"standard-input-closed", Group::kNotLookedAt,
     Severity::kUnseen, ChainLink::kKey, "", "standard input is closed, so the file got its place, "
     "descriptor 0, which the tool takes for a failure",
@@ -91,11 +93,11 @@ inline constexpr Cause kToolSilent = {"tool-silent", Group::kSimulation, Severit
     ChainLink::kKey, "", "the tool neither said nor did anything, though the file can be opened",
     "Check --tool: it has to be apktoolkit."};
 inline constexpr Cause kStateNotKept = {"state-not-kept", Group::kSimulation, Severity::kFailed,
-    ChainLink::kKey, "", "what was signed cannot be kept in %s",
-    "Make the --state folder writable."};
+    ChainLink::kKey, "", "the signed files cannot be remembered in %s",
+    "Make the --state directory writable."};
 inline constexpr Cause kNotInstalled = {"not-installed", Group::kSimulation, Severity::kFailed,
     ChainLink::kKey, "", "its libraries cannot be laid out: %s",
-    "Make room in the folder for temporary files (TMPDIR)."};
+    "Make room in the directory for temporary files (TMPDIR)."};
 inline constexpr Cause kNotBegun = {"not-begun", Group::kSimulation, Severity::kFailed,
     ChainLink::kKey, "", "no file could be simulated: %s",
     "Fix the reported error, and run again."};
@@ -148,7 +150,8 @@ inline constexpr Cause kPackageWithoutManifest = {"package-without-manifest", Gr
 inline constexpr Cause kJarNotTrusted = {"jar-not-trusted", Group::kFile, Severity::kRefused,
     ChainLink::kKey, "`VELT can't verify a file`",
     "it is a plain JAR, and those are signed only when the kernel trusts them already (%s)",
-    "Nothing, unless the JAR should have come from a trusted image; --trust makes it so here."};
+    "Nothing to do, unless the JAR should have come from a trusted image. Here --trust makes the "
+    "kernel trust it."};
 inline constexpr Cause kAndroidManifestDamaged = {"android-manifest-damaged", Group::kFile,
     Severity::kRefused, ChainLink::kKey, "`Can't extract Android Manifest`", "its "
     "AndroidManifest.xml cannot be extracted, so it counts as a plain JAR, which the kernel does "
@@ -313,25 +316,26 @@ inline constexpr Cause kLibraryDigest = {"library-digest", Group::kLibrary, Seve
     "Sign the package with SHA-256 digests, as apksigner does."};
 inline constexpr Cause kLibraryNoPermission = {"library-no-permission", Group::kLibrary,
     Severity::kRefused, ChainLink::kNone, "`Can't open file`", "it may not be read",
-    "Give the user who runs the tool the right to read it and to enter its folders."};
+    "Give the user who runs the tool the right to read it and to enter its "
+    "directories."};
 inline constexpr Cause kLibraryNotOpened = {"library-not-opened", Group::kLibrary,
     Severity::kRefused, ChainLink::kNone, "`Can't open file`, `File %s is not opened`",
     "it cannot be opened (%s)", "Fix the reported error, and run again."};
 inline constexpr Cause kLibraryNoFile = {"library-no-file", Group::kLibrary, Severity::kRefused,
-    ChainLink::kNone, "`Can't read file`", "what lies there is not a file, or too large to read",
+    ChainLink::kNone, "`Can't read file`", "the thing at its place is not a file, or is too large to read",
     "Find out who put it there, and install the package again."};
 inline constexpr Cause kLibraryInPackage = {"library-in-package", Group::kLibrary,
     Severity::kAbsent, ChainLink::kNone, "`Can't open file`",
     "it stays inside the package (extractNativeLibs=\"false\")",
-    "Nothing: it is loaded from the package."};
+    "Nothing to do: it is loaded from the package."};
 inline constexpr Cause kLibraryNotInstalled = {"library-not-installed", Group::kLibrary,
     Severity::kAbsent, ChainLink::kNone, "`Can't open file`",
-    "no libraries for its processor lie beside the package", "Nothing, where the phone is of "
-    "another kind. To lay out those of all processors: --install=all."};
+    "no libraries for its processor lie beside the package", "Nothing to do for "
+    "a phone of another kind. To lay out those of all processors: --install=all."};
 inline constexpr Cause kLibraryNotLaidOut = {"library-not-laid-out", Group::kLibrary,
     Severity::kNothing, ChainLink::kNone, "`Can't open file`",
     "it is for another processor than the phone's (--install=all lays out those of all)",
-    "Nothing: phones install the libraries of one processor."};
+    "Nothing to do: phones install the libraries of one processor."};
 inline constexpr Cause kLibraryInSubdirectory = {"library-in-subdirectory", Group::kLibrary,
     Severity::kAbsent, ChainLink::kNone, "`Can't open file`",
     "it is in a subdirectory of its ABI: the tool looks for %s, and installers do not put it there",
@@ -341,10 +345,10 @@ inline constexpr Cause kLibraryMissing = {"library-missing", Group::kLibrary, Se
     "Install the package again, unless the installer leaves it out on purpose."};
 inline constexpr Cause kLibraryOtherAbi = {"library-other-abi", Group::kLibrary, Severity::kNothing,
     ChainLink::kNone, "", "no phone of this kind installs it",
-    "Nothing: the tool knows no directory for its ABI."};
+    "Nothing to do: the tool knows no directory for its ABI."};
 inline constexpr Cause kPackageRefused = {"package-refused", Group::kLibrary, Severity::kFollows,
     ChainLink::kNone, "`VeltSignJni: malformed apk`, `Apk archive is not valid`",
-    "the package is refused", "Fix what the package is refused for; this follows."};
+    "the package is refused", "First fix the reason why the package is refused."};
 inline constexpr Cause kNotReached = {"not-reached", Group::kLibrary, Severity::kFollows,
     ChainLink::kEntries, "", "the tool did not come to it", "See why the tool ended early."};
 inline constexpr Cause kLibraryLeased = {"library-leased", Group::kLibrary, Severity::kRefused,
@@ -361,10 +365,10 @@ inline constexpr Cause kLibraryBehindDamage = {"library-behind-damage", Group::k
 // ---- The key.
 inline constexpr Cause kRegistrationRefused = {"registration-refused", Group::kKey,
     Severity::kRefused, ChainLink::kNone, "`ZuNewCertificate failed`", "libzu answered %s",
-    "The code is the library's own. What was signed stays signed."};
+    "The code is the library's own. Files that were signed stay signed."};
 inline constexpr Cause kRegistrationNoPath = {"registration-no-path", Group::kKey,
     Severity::kRefused, ChainLink::kNone, "`Can't get jar location`",
-    "its path cannot be found out", "Check that /proc is mounted and can be read."};
+    "its path cannot be read", "Check that /proc is mounted and can be read."};
 
 // ---- The tool itself.
 inline constexpr Cause kToolKilled = {"tool-killed", Group::kTool, Severity::kRefused,
@@ -399,7 +403,7 @@ inline constexpr Cause kSignerNone = {"signer-none", Group::kGate, Severity::kRe
     "Look at JARs without --signer."};
 inline constexpr Cause kSignerNotVerified = {"signer-not-verified", Group::kGate,
     Severity::kFollows, ChainLink::kNone, "", "its signer is not known: the tool verified no "
-    "signature (%s)", "Fix what the file is refused for; this follows."};
+    "signature (%s)", "First fix the reason why the file is refused."};
 inline constexpr Cause kSignerDiffers = {"signer-differs", Group::kGate, Severity::kRefused,
     ChainLink::kNone, "", "the files of a package must have one signer: %s",
     "Sign all files of the package with one key and certificate. Look at other builds of it in "
@@ -419,7 +423,7 @@ inline constexpr Cause kSchemesStripped = {"schemes-stripped", Group::kWarning, 
     "it is not: phones do not install it",
     "Sign the package again, as the last step that changes it."};
 inline constexpr Cause kSigningBlockDamaged = {"signing-block-damaged", Group::kWarning,
-    Severity::kWarning, ChainLink::kNone, "", "the block of the schemes after v1 does not read",
+    Severity::kWarning, ChainLink::kNone, "", "its signing block (v2 and later) is damaged",
     "Sign the package again."};
 inline constexpr Cause kSeveralSigners = {"several-signers", Group::kWarning, Severity::kWarning,
     ChainLink::kNone, "", "it has more than one signer; the kernel gets the key of %s alone",
@@ -472,11 +476,11 @@ inline constexpr Cause kOtherPackageName = {"other-package-name", Group::kWarnin
     "Build the package again with aapt or aapt2. If it is not of your making: do not trust it."};
 inline constexpr Cause kFileChanged = {"file-changed", Group::kWarning, Severity::kAlarm,
     ChainLink::kNone, "",
-    "it was changed while it was looked at, so that what is told of it may be of other bytes",
+    "it was changed during the run, so parts of this answer may be about other bytes",
     "Run again when nobody writes to it."};
 inline constexpr Cause kNotLookedInto = {"not-looked-into", Group::kWarning, Severity::kAlarm,
-    ChainLink::kNone, "", "%s is too large to be looked into, and nothing is told of it",
-    "Do not trust this package, if it is not of your making: those of real packages are small."};
+    ChainLink::kNone, "", "%s is too large and was not read, so this answer leaves it out",
+    "Do not trust this package, if it is not of your making: in real packages it is small."};
 inline constexpr Cause kEntriesEncrypted = {"entries-encrypted", Group::kWarning, Severity::kDoubt,
     ChainLink::kNone, "", "%s: encrypted, and no phone decrypts it",
     "Build the package again without a password."};

@@ -499,7 +499,7 @@ TEST_F(Reason, LibrariesThatDoNotLieBesideThePackage) {
   EXPECT_EQ(Told(7),
             Lines({"SIGNED  base.apk" + ByRsa2048(), kSigned,
                    "  – lib/arm64/libvault.so  " + absent, "  – lib/arm/libvault.so    " + absent,
-                   "      Nothing, where the phone is of another kind. To lay out those of all",
+                   "      Nothing to do for a phone of another kind. To lay out those of all",
                    "      processors: --install=all.",
                    "  ✓ key                    registered for com.example.vault", "-> 0"}));
   EXPECT_EQ(Told(1, {"--strict"}), Lines({"PARTLY SIGNED  base.apk", "-> 1"}));
@@ -554,7 +554,7 @@ TEST_F(Reason, LibrariesThatThePackageKeeps) {
             Lines({"SIGNED  base.apk" + ByRsa2048(),
                    "  ✓ package                 signed with the payload of that key",
                    "  – lib/arm64/libvault.so   " + kept, "  – lib/arm/libvault.so     " + kept,
-                   "      Nothing: it is loaded from the package.",
+                   "      Nothing to do: it is loaded from the package.",
                    "  – lib/x86_64/libvault.so  nothing to sign: no phone of this kind installs it",
                    "-> 0"}));
   EXPECT_EQ(Told(3, {"--install=all"})[2], "  – lib/arm64/libvault.so   " + kept);

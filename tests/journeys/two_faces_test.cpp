@@ -276,8 +276,7 @@ TEST(TwoFaces, SigningBlockThatIsTooLargeIsTold) {
       {{7, Bytes(16 << 20, 0)}, {kSchemeV2, Signers({SignerBytes(certificate.Build())})}});
   const Told told(ArchiveWithBlock(MakePackage().Build(), block));
   EXPECT_EQ(told.Warnings(), Codes({"not-looked-into"}));
-  EXPECT_TRUE(
-      Has(told.head, "   ! the block of the schemes after v1 is too large to be looked into"))
+  EXPECT_TRUE(Has(told.head, "   ! the signing block (v2 and later) is too large and was not read"))
       << told.head;
 }
 

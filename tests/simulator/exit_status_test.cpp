@@ -44,8 +44,8 @@ TEST(ExitStatus, FourForAFileThatIsNotThere) {
   EXPECT_EQ(result.output,
             "NOT LOOKED AT  /nowhere/base.apk   there is no such file\n"
             "  ✗ file  not looked at: there is no such file\n"
-            "      Check the name; a relative one counts from the folder in which the tool is\n"
-            "      run.\n"
+            "      Check the name; a relative one counts from the directory in which the tool\n"
+            "      is run.\n"
             "   1  exit       status 0\n");
 }
 

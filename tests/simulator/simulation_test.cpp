@@ -337,7 +337,7 @@ TEST(Simulation, TellsThatTheFileWasChangedMeanwhile) {
   const std::string file = folder / "base.apk";
   MakePackage().WriteTo(file);
   const std::string runner = RunnerThat("touch " + file, folder);
-  const std::string changed = "   ! it was changed while it was looked at";
+  const std::string changed = "   ! it was changed during the run";
   EXPECT_NE(Told({"--quiet", "--runner", runner, file}).output.find(changed), std::string::npos);
   EXPECT_EQ(Told({"--quiet", file}).output.find(changed), std::string::npos);
   // A file that the tool could not open does not count as changed.

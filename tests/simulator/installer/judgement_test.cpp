@@ -71,13 +71,13 @@ TEST(Judgement, WhatDoesNotReadIsNoAnswer) {
         Answer("true", R"([{"scheme":"v2","certificate":"3000"}])", "[]"),
         Answer("false", "[]", "1"), Answer("false", "[]", "[1]"),
         Answer("false", "[]", R"([{"issue":"A","parameters":[1],"text":""}])")}) {
-    EXPECT_EQ(WhyNone(answer), "its answer does not read") << answer;
+    EXPECT_EQ(WhyNone(answer), "its answer is malformed") << answer;
   }
 }
 
 // Otherwise a package could be installable with errors, or for nobody.
 TEST(Judgement, AnswerThatContradictsItselfIsNone) {
-  EXPECT_EQ(WhyNone(Answer("true", kSigner, kError)), "its answer does not read");
-  EXPECT_EQ(WhyNone(Answer("true", "[]", "[]")), "its answer does not read");
-  EXPECT_EQ(WhyNone(Answer("false", "[]", "[]")), "its answer does not read");
+  EXPECT_EQ(WhyNone(Answer("true", kSigner, kError)), "its answer is malformed");
+  EXPECT_EQ(WhyNone(Answer("true", "[]", "[]")), "its answer is malformed");
+  EXPECT_EQ(WhyNone(Answer("false", "[]", "[]")), "its answer is malformed");
 }

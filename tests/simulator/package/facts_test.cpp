@@ -246,7 +246,7 @@ TEST(PackageFacts, TellWhatIsTooLongToBeLookedInto) {
   const PackageFacts facts = FactsOf(ArchiveWithBlock(package.Build(), huge));
   EXPECT_EQ(facts.jar.manifest, Archive::ReadResult::kTooLong);
   EXPECT_EQ(facts.too_long,
-            std::vector<std::string>({kManifestName, "the block of the schemes after v1"}));
+            std::vector<std::string>({kManifestName, "the signing block (v2 and later)"}));
   EXPECT_FALSE(facts.has_damaged_signing_block);
 }
 

@@ -382,7 +382,7 @@ TEST(Page, KeepsTheNamesOfOptionsWhole) {
   report.items = {Library("a", &cause::kLibraryNotInstalled)};
   report.items[0].state = ItemState::kAbsent;
   EXPECT_TRUE(Has(PageOf(report),
-                  "<p class=\"cure\">Nothing, where the phone is of another kind. To lay out those "
+                  "<p class=\"cure\">Nothing to do for a phone of another kind. To lay out those "
                   "of all processors: <span class=\"option\">--install=all</span>.</p>"));
   EXPECT_TRUE(Has(PageOf(report), ".option { white-space: nowrap; }"));
 }

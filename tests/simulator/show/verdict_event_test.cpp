@@ -95,10 +95,10 @@ TEST(VerdictEvent, HoldsTheWholeReport) {
       {"kind": "library", "name": "lib/x86/a.so", "entry": "lib/x86/a.so",
        "state": "nothing-to-sign", "reason": "library-other-abi",
        "text": "no phone of this kind installs it",
-       "cure": "Nothing: this tool knows arm64-v8a, armeabi-v7a and armeabi."},
+       "cure": "Nothing to do: the tool knows no directory for its ABI."},
       {"kind": "key", "name": "com.app", "state": "registered"}],
     "warnings": [{"reason": "signing-block-damaged",
-                  "text": "the block of the schemes after v1 does not read",
+                  "text": "its signing block (v2 and later) is damaged",
                   "cure": "Sign the package again."}],
     "signers": [
       {"scheme": "v1", "subject": "CN=a", "certificate_sha256": "11", "certificate_sha1": "55",
