@@ -23,7 +23,6 @@ namespace {
 constexpr int kOpenFlags = O_RDONLY | O_CLOEXEC | O_NONBLOCK | O_NOCTTY;
 
 FileKind KindOf(int fd, uint64_t size);
-std::string DigestOf(int fd, const IsLate& is_late);
 bool IsText(const std::string& start);
 void ReadArchive(int fd, const IsLate& is_late, PackageFacts* facts);
 std::string FindEntryTwice(int fd);
@@ -50,10 +49,24 @@ PackageFacts LookAt(const std::string& path, const IsLate& is_late) {
   } else {
     facts.size = static_cast<uint64_t>(state.st_size);
     facts.kind = KindOf(file.get(), facts.size);
-    facts.sha256 = DigestOf(file.get(), is_late);
+    facts.sha256 = FileSha256(file.get(), is_late);
     if (facts.kind == FileKind::kArchive) ReadArchive(file.get(), is_late, &facts);
   }
   return facts;
+}
+
+std::string FileSha256(int fd, const IsLate& is_late) {
+  constexpr size_t kPart = 1 << 20;
+  Sha256 digest;
+  std::string part(kPart, '\0');
+  for (off_t offset = 0; !is_late();) {
+    const ssize_t size = pread(fd, part.data(), part.size(), offset);
+    if (size < 0) break;
+    if (size == 0) return digest.Hex();
+    digest.Add({part.data(), static_cast<size_t>(size)});
+    offset += size;
+  }
+  return {};
 }
 
 std::vector<std::string> NewerSchemes(const PackageFacts& facts) {
@@ -75,21 +88,6 @@ FileKind KindOf(int fd, uint64_t size) {
   const std::string start = ReadAt(fd, 0, kStart);
   if (start.compare(0, 4, kLocalHeader) == 0) return FileKind::kCutArchive;
   return IsText(start) ? FileKind::kText : FileKind::kNoArchive;
-}
-
-// Empty once it is late, and where the file cannot be read.
-std::string DigestOf(int fd, const IsLate& is_late) {
-  constexpr size_t kPart = 1 << 20;
-  Sha256 digest;
-  std::string part(kPart, '\0');
-  for (off_t offset = 0; !is_late();) {
-    const ssize_t size = pread(fd, part.data(), part.size(), offset);
-    if (size < 0) break;
-    if (size == 0) return digest.Hex();
-    digest.Add({part.data(), static_cast<size_t>(size)});
-    offset += size;
-  }
-  return {};
 }
 
 // No control characters but those that texts have.

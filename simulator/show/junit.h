@@ -1,6 +1,6 @@
 // The report of a run for what reads test results: one JUnit document, a test case for each file. A
 // refusal is a failure, and a file that was not judged is an error: no case is ever skipped.
-// Whatever comes from a file is text in it.
+// Texts that come from a file stay texts.
 #pragma once
 
 #include <string>
@@ -11,7 +11,7 @@
 
 namespace simulator {
 
-// What each document begins with.
+// The start of each document.
 inline constexpr std::string_view kJunitStart =
     "<?xml version=\"1.0\" encoding=\"UTF-8\"?>\n<!-- A JUnit report of apktoolkit-sim -->\n";
 

@@ -1,8 +1,8 @@
 // The report of a run for what reads the results of static analysis: one SARIF log (OASIS Static
 // Analysis Results Interchange Format, version 2.1.0). Each thing that was refused is a result of
 // level "error", each warning one of level "warning"; the rules are the causes. A file that was not
-// judged is an error, and the run that it belongs to was not successful. Whatever comes from a file
-// is text in it.
+// judged is an error, and the run that it belongs to was not successful. Texts that come from a file
+// stay texts.
 #pragma once
 
 #include <map>
@@ -14,7 +14,7 @@
 
 namespace simulator {
 
-// What each log begins with.
+// The start of each log.
 inline constexpr std::string_view kSarifStart =
     "{\n"
     "  \"$schema\": \"https://docs.oasis-open.org/sarif/sarif/v2.1.0/errata01/os/schemas/"
