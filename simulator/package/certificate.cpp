@@ -11,8 +11,6 @@
 
 #include <algorithm>
 #include <cctype>
-#include <filesystem>
-#include <fstream>
 
 #include "simulator/phone/text.h"
 
@@ -91,19 +89,6 @@ std::string Sha256Hex(std::string_view bytes) {
   Sha256 digest;
   digest.Add(bytes);
   return digest.Hex();
-}
-
-std::string FileSha256(const std::string& path) {
-  std::error_code error;
-  if (!std::filesystem::is_regular_file(path, error)) return {};
-  std::ifstream file(path, std::ios::binary);
-  if (!file) return {};
-  Sha256 digest;
-  std::string part(1 << 20, '\0');
-  while (file.read(part.data(), static_cast<std::streamsize>(part.size())) || file.gcount() > 0) {
-    digest.Add({part.data(), static_cast<size_t>(file.gcount())});
-  }
-  return file.bad() ? std::string() : digest.Hex();
 }
 
 std::string Sha256::Hex() {

@@ -54,8 +54,6 @@ AlgorithmFacts ParseAlgorithm(std::string_view der);
 // The digest in lower-case hexadecimal.
 std::string Sha1Hex(std::string_view bytes);
 std::string Sha256Hex(std::string_view bytes);
-// The same of a file's bytes; empty where it is not a regular file, or cannot be read.
-std::string FileSha256(const std::string& path);
 
 // The same of bytes that come in parts.
 class Sha256 {

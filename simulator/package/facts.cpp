@@ -27,7 +27,6 @@ constexpr int kOpenFlags = O_RDONLY | O_CLOEXEC | O_NONBLOCK | O_NOCTTY;
 
 FileKind KindOf(int fd, uint64_t size);
 uint64_t CountPackages(const std::string& directory);
-std::string DigestOf(int fd, const IsLate& is_late);
 bool IsText(const std::string& start);
 void ReadArchive(int fd, const IsLate& is_late, PackageFacts* facts);
 std::string FindEntryTwice(int fd);
@@ -55,10 +54,24 @@ PackageFacts LookAt(const std::string& path, const IsLate& is_late) {
   } else {
     facts.size = static_cast<uint64_t>(state.st_size);
     facts.kind = KindOf(file.get(), facts.size);
-    facts.sha256 = DigestOf(file.get(), is_late);
+    facts.sha256 = FileSha256(file.get(), is_late);
     if (facts.kind == FileKind::kArchive) ReadArchive(file.get(), is_late, &facts);
   }
   return facts;
+}
+
+std::string FileSha256(int fd, const IsLate& is_late) {
+  constexpr size_t kPart = 1 << 20;
+  Sha256 digest;
+  std::string part(kPart, '\0');
+  for (off_t offset = 0; !is_late();) {
+    const ssize_t size = pread(fd, part.data(), part.size(), offset);
+    if (size < 0) break;
+    if (size == 0) return digest.Hex();
+    digest.Add({part.data(), static_cast<size_t>(size)});
+    offset += size;
+  }
+  return {};
 }
 
 std::vector<std::string> NewerSchemes(const PackageFacts& facts) {
@@ -92,21 +105,6 @@ uint64_t CountPackages(const std::string& directory) {
     count += IsPackageName(entry->path().string()) && !entry->is_directory(error) ? 1 : 0;
   }
   return count;
-}
-
-// Empty once it is late, and where the file cannot be read.
-std::string DigestOf(int fd, const IsLate& is_late) {
-  constexpr size_t kPart = 1 << 20;
-  Sha256 digest;
-  std::string part(kPart, '\0');
-  for (off_t offset = 0; !is_late();) {
-    const ssize_t size = pread(fd, part.data(), part.size(), offset);
-    if (size < 0) break;
-    if (size == 0) return digest.Hex();
-    digest.Add({part.data(), static_cast<size_t>(size)});
-    offset += size;
-  }
-  return {};
 }
 
 // No control characters but those that texts have.

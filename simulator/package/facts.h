@@ -74,6 +74,11 @@ struct PackageFacts {
 PackageFacts LookAt(
     const std::string& path, const IsLate& is_late = [] { return false; });
 
+// The SHA-256 digest of the bytes of an open file, in lower-case hexadecimal; empty once it is
+// late, and where they cannot be read.
+std::string FileSha256(
+    int fd, const IsLate& is_late = [] { return false; });
+
 // The names of the schemes after v1 that somebody signed with, each once, in the file's order.
 std::vector<std::string> NewerSchemes(const PackageFacts& facts);
 

@@ -81,7 +81,8 @@ std::optional<std::string> Simulator::Prepare() {
   kernel_descriptor_.emplace(open(kernel_.c_str(), O_RDONLY | O_CLOEXEC));
   if (kernel_descriptor_->get() < 0) return "there is no stand-in " + kernel_ + ErrnoText();
   if (access(options_.tool.c_str(), X_OK) != 0) return "cannot run " + options_.tool + ErrnoText();
-  tool_sha256_ = FileSha256(options_.tool);
+  const ScopedFd tool(open(options_.tool.c_str(), O_RDONLY | O_CLOEXEC | O_NONBLOCK));
+  tool_sha256_ = FileSha256(tool.get());
   if (!signed_.Load()) return "cannot use the directory " + options_.state;
   return {};
 }

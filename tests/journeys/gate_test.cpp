@@ -219,7 +219,7 @@ TEST(Warning, OfAShortKeyOrADebugCertificate) {
   EXPECT_EQ(WarningsOf(MakePackage(options)), Lines({"weak-key"}));
   options.block.key = "rsa-2048";
   Certificate certificate = options.block.SignerCertificate();
-  certificate.subject = certificate.issuer = Name({{"2.5.4.3", "Android Debug"}});
+  certificate.subject = Name({{"2.5.4.3", "Android Debug"}});
   options.block.certificates = certificate.Build();
   EXPECT_EQ(WarningsOf(MakePackage(options)), Lines({"debug-key"}));
 }
