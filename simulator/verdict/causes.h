@@ -94,7 +94,7 @@ inline constexpr Cause kStateNotKept = {"state-not-kept", Group::kSimulation, Se
     "Make the --state folder writable."};
 inline constexpr Cause kNotInstalled = {"not-installed", Group::kSimulation, Severity::kFailed,
     ChainLink::kKey, "", "its libraries cannot be laid out: %s",
-    "Make room in the folder for temporary files (TMPDIR)."};
+    "Make room in the directory for temporary files (TMPDIR), or give --install=no."};
 inline constexpr Cause kInterrupted = {"interrupted", Group::kSimulation, Severity::kFailed,
     ChainLink::kKey, "", "it was interrupted", "Run it again."};
 
