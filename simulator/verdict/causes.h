@@ -97,7 +97,7 @@ inline constexpr Cause kStateNotKept = {"state-not-kept", Group::kSimulation, Se
     "Make the --state directory writable."};
 inline constexpr Cause kNotInstalled = {"not-installed", Group::kSimulation, Severity::kFailed,
     ChainLink::kKey, "", "its libraries cannot be laid out: %s",
-    "Make room in the directory for temporary files (TMPDIR)."};
+    "Make room in the directory for temporary files (TMPDIR), or give --install=no."};
 inline constexpr Cause kNotBegun = {"not-begun", Group::kSimulation, Severity::kFailed,
     ChainLink::kKey, "", "no file could be simulated: %s",
     "Fix the reported error, and run again."};

@@ -81,7 +81,7 @@ TEST_F(ManyFiles, DirectoryWithoutRecursiveIsRefusedWithTheCure) {
 // The tool looked at nothing there, so the run must fail.
 TEST_F(ManyFiles, DirectoryWithoutPackagesIsNoSuccess) {
   fs::create_directory(folder_ / "empty");
-  EXPECT_EQ(Told(Do("sim --recursive good empty --journal journal")),
+  ASSERT_EQ(Told(Do("sim --recursive good empty --journal journal")),
             Lines({"SIGNED  good/base.apk", "NOT LOOKED AT  empty", "-> 4"}));
   const std::string journal = ContentOf(folder_ / "journal");
   const size_t last = journal.rfind("{\"event\":\"verdict\"");

@@ -101,15 +101,25 @@ def run_and_kill(shell, command):
     if process.poll() is not None:
         return [f"$ {command}", "ended before it was killed:", *process.communicate()]
     kill_session(process)
-    done = len(shell.journals())
-    return [] if 0 < done < LISTS else [f"{done} of {LISTS} lists were done when it was killed"]
+    done = shell.journals()
+    problems = [f"the journal {name} is not whole" for name in done if not is_whole(shell, name)]
+    if not 0 < len(done) < LISTS:
+        problems.append(f"{len(done)} of {LISTS} lists were done when it was killed")
+    return problems
+
+
+def is_whole(shell, name):
+    """Whether the journal has a verdict for each package of its list."""
+    lines = (shell.directory / "journals" / name).read_text().splitlines()
+    verdicts = sum(line.startswith('{"event":"verdict"') for line in lines)
+    return verdicts == (shell.directory / "batches" / name).read_bytes().count(b"\0")
 
 
 def check(directory, simulator, expected):
     shell = Store(directory, simulator)
     problems, printed = [], {}
     for command in commands():
-        if command.startswith("ls batches | parallel "):
+        if "| parallel " in command:
             problems += run_and_kill(shell, command)
             first = {name: (directory / "journals" / name).stat().st_mtime_ns
                      for name in shell.journals()}

@@ -70,8 +70,9 @@ TEST(FileList, LinksToDirectoriesAreFollowedOnlyIfNamed) {
   const TempDir directory;
   directory.Write("real/a.apk", {});
   fs::create_directory_symlink("real", directory / "named");
-  fs::create_directory_symlink("..", directory / "real/up");
-  fs::create_directory_symlink("..", directory / "real/up.apk");
+  directory.Write("aside/d.apk", {});
+  fs::create_directory_symlink("../aside", directory / "real/link");
+  fs::create_directory_symlink("../aside", directory / "real/link.apk");
   fs::create_symlink("a.apk", directory / "real/b.apk");
   fs::create_symlink("gone", directory / "real/c.apk");
   EXPECT_EQ(Listed(directory, Recursive({directory / "named"})),
