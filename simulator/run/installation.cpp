@@ -113,7 +113,7 @@ std::string Installation::WithStablePaths(const std::string& journal) const {
        from = at + directory.size()) {
     stable.append(journal, from, at - from).append(kInstalledDirectory);
   }
-  return stable.append(journal, from, std::string::npos);
+  return stable.append(journal.substr(from));
 }
 
 namespace {
