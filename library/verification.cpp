@@ -2,7 +2,6 @@
 
 #include <android/log.h>
 
-#include <cerrno>
 #include <cstdarg>
 #include <cstdio>
 #include <cstring>
@@ -42,6 +41,7 @@ thread_local Reason* heard = nullptr;
 
 Reason ReasonOf(Apk& apk, Reason logged);
 bool HasEntry(Apk& apk, const std::string& prefix, const std::string& suffix);
+int HearAndLog(int priority, const char* tag, const char* format, va_list arguments);
 void Hear(std::string_view text);
 
 }  // namespace
@@ -112,7 +112,7 @@ Reason ReasonOf(Apk& apk, Reason logged) {
   return is_signed ? Reason::kSignatureUnreadable : Reason::kUnsigned;
 }
 
-// Whether there is an entry of the name `prefix` or, if `suffix` is not empty, of a name that
+// True if there is an entry of the name `prefix` or, if `suffix` is not empty, of a name that
 // begins and ends so.
 bool HasEntry(Apk& apk, const std::string& prefix, const std::string& suffix) {
   void* cookie;
@@ -123,6 +123,14 @@ bool HasEntry(Apk& apk, const std::string& prefix, const std::string& suffix) {
   while (!has && apk.Next(cookie, &entry, name) == 0) has = !suffix.empty() || name == prefix;
   apk.EndIteration(cookie);
   return has;
+}
+
+__attribute__((format(printf, 3, 0))) int HearAndLog(int priority, const char* tag,
+                                                     const char* format, va_list arguments) {
+  char text[kLogTextSize];
+  vsnprintf(text, sizeof(text), format, arguments);
+  if (tag != nullptr && strcmp(tag, kLogTag) == 0) Hear(text);
+  return __android_log_write(priority, tag, text);
 }
 
 void Hear(std::string_view text) {
@@ -136,16 +144,12 @@ void Hear(std::string_view text) {
 
 }  // namespace ApkTools
 
-// The program's definition comes before the platform's, for the platform's libraries as well. What
-// is longer than a record of the log is cut, as the log would cut it.
+// The program's definition comes before the platform's, for the platform's libraries as well. A
+// text that is longer than a record of the log is cut, as the log would cut it.
 extern "C" int __android_log_print(int priority, const char* tag, const char* format, ...) {
-  const int saved_errno = errno;
-  char text[kLogTextSize];
   va_list arguments;
   va_start(arguments, format);
-  vsnprintf(text, sizeof(text), format, arguments);
+  const int result = ApkTools::HearAndLog(priority, tag, format, arguments);
   va_end(arguments);
-  if (tag != nullptr && strcmp(tag, kLogTag) == 0) ApkTools::Hear(text);
-  errno = saved_errno;
-  return __android_log_write(priority, tag, text);
+  return result;
 }

@@ -51,7 +51,7 @@ class Verification {
 
   // kGood if and only if the package's IsGoodApk() is true.
   Reason reason() const { return reason_; }
-  // What was found: package name, signer's key, entries. Never null, and gone with this object.
+  // The package: its name, the signer's key, the entries. Gone with this object.
   Apk& apk() { return *apk_; }
 
  private:

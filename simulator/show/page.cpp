@@ -210,7 +210,7 @@ list Pieces(std::string_view text) {
   return pieces;
 }
 
-// What file this is, and of what run: all that a reader needs who gets this part alone.
+// The facts of the file and of the run, for a reader who gets this part alone.
 list FactRows(const Report& report, const PageRun& run) {
   Rows rows = {{"path", report.path}};
   if (!report.file_sha256.empty()) {

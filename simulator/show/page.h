@@ -25,7 +25,7 @@ inline constexpr std::string_view kPageStart =
 // The page's template (page.mustache), which the build makes a part of the program.
 extern const char kPageTemplate[];
 
-// What is told of the whole run.
+// The facts of the whole run.
 struct PageRun {
   std::time_t begun = 0;  // when it began
   std::string tool;       // the program that --tool names; empty: the tool of this version
