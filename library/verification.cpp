@@ -47,12 +47,11 @@ void Hear(std::string_view text);
 }  // namespace
 
 Verification::Verification(int fd) {
-  Reason logged = Reason::kUnknown;
-  Reason* const outer = std::exchange(heard, &logged);
+  Reason* const outer = std::exchange(heard, &reason_);
   apk_.emplace(fd);
   const bool is_good = apk_->IsGoodApk();
   heard = outer;
-  reason_ = is_good ? Reason::kGood : ReasonOf(*apk_, logged);
+  reason_ = is_good ? Reason::kGood : ReasonOf(*apk_, reason_);
 }
 
 Verification::~Verification() { apk_->Release(); }
@@ -128,6 +127,7 @@ bool HasEntry(Apk& apk, const std::string& prefix, const std::string& suffix) {
 __attribute__((format(printf, 3, 0))) int HearAndLog(int priority, const char* tag,
                                                      const char* format, va_list arguments) {
   char text[kLogTextSize];
+  // NOLINTNEXTLINE(clang-analyzer-valist.Uninitialized): it follows LogText, and misses va_start.
   vsnprintf(text, sizeof(text), format, arguments);
   if (tag != nullptr && strcmp(tag, kLogTag) == 0) Hear(text);
   return __android_log_write(priority, tag, text);
