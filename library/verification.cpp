@@ -2,7 +2,6 @@
 
 #include <android/log.h>
 
-#include <cerrno>
 #include <cstdarg>
 #include <cstdio>
 #include <cstring>
@@ -42,17 +41,17 @@ thread_local Reason* heard = nullptr;
 
 Reason ReasonOf(Apk& apk, Reason logged);
 bool HasEntry(Apk& apk, const std::string& prefix, const std::string& suffix);
+int HearAndLog(int priority, const char* tag, const char* format, va_list arguments);
 void Hear(std::string_view text);
 
 }  // namespace
 
 Verification::Verification(int fd) {
-  Reason logged = Reason::kUnknown;
-  Reason* const outer = std::exchange(heard, &logged);
+  Reason* const outer = std::exchange(heard, &reason_);
   apk_.emplace(fd);
   const bool is_good = apk_->IsGoodApk();
   heard = outer;
-  reason_ = is_good ? Reason::kGood : ReasonOf(*apk_, logged);
+  reason_ = is_good ? Reason::kGood : ReasonOf(*apk_, reason_);
 }
 
 Verification::~Verification() { apk_->Release(); }
@@ -112,7 +111,7 @@ Reason ReasonOf(Apk& apk, Reason logged) {
   return is_signed ? Reason::kSignatureUnreadable : Reason::kUnsigned;
 }
 
-// Whether there is an entry of the name `prefix` or, if `suffix` is not empty, of a name that
+// True if there is an entry of the name `prefix` or, if `suffix` is not empty, of a name that
 // begins and ends so.
 bool HasEntry(Apk& apk, const std::string& prefix, const std::string& suffix) {
   void* cookie;
@@ -123,6 +122,15 @@ bool HasEntry(Apk& apk, const std::string& prefix, const std::string& suffix) {
   while (!has && apk.Next(cookie, &entry, name) == 0) has = !suffix.empty() || name == prefix;
   apk.EndIteration(cookie);
   return has;
+}
+
+__attribute__((format(printf, 3, 0))) int HearAndLog(int priority, const char* tag,
+                                                     const char* format, va_list arguments) {
+  char text[kLogTextSize];
+  // NOLINTNEXTLINE(clang-analyzer-valist.Uninitialized): it follows LogText, and misses va_start.
+  vsnprintf(text, sizeof(text), format, arguments);
+  if (tag != nullptr && strcmp(tag, kLogTag) == 0) Hear(text);
+  return __android_log_write(priority, tag, text);
 }
 
 void Hear(std::string_view text) {
@@ -139,13 +147,9 @@ void Hear(std::string_view text) {
 // The program's definition comes before the platform's, for the platform's libraries as well. A
 // text that is longer than a record of the log is cut at the same place as in the log.
 extern "C" int __android_log_print(int priority, const char* tag, const char* format, ...) {
-  const int saved_errno = errno;
-  char text[kLogTextSize];
   va_list arguments;
   va_start(arguments, format);
-  vsnprintf(text, sizeof(text), format, arguments);
+  const int result = ApkTools::HearAndLog(priority, tag, format, arguments);
   va_end(arguments);
-  if (tag != nullptr && strcmp(tag, kLogTag) == 0) ApkTools::Hear(text);
-  errno = saved_errno;
-  return __android_log_write(priority, tag, text);
+  return result;
 }

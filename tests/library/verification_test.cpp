@@ -5,7 +5,6 @@
 #include <gtest/gtest.h>
 #include <unistd.h>
 
-#include <cerrno>
 #include <set>
 #include <sstream>
 
@@ -176,14 +175,6 @@ TEST(VerificationLog, HasTheLinesAllTheSame) {
   const Verification verification(file.fd());
   const std::string log = testing::internal::GetCapturedStderr();
   EXPECT_NE(log.find("Can't validate manifest."), std::string::npos) << log;
-}
-
-TEST(VerificationLog, LeavesErrnoAlone) {
-  errno = ENOENT;
-  testing::internal::CaptureStderr();
-  LogError("%s\n", "text");
-  EXPECT_EQ(errno, ENOENT);
-  testing::internal::GetCapturedStderr();
 }
 
 TEST(VerificationRelease, TwoThousandPackagesLeaveNoMappings) {
