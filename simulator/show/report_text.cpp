@@ -100,10 +100,14 @@ void Printer::PrintWarnings() {
 
 void Printer::PrintUnlisted() {
   const Protection& all = report_.protection;
-  for (const auto& [names, word] : {std::make_pair(&all.differing_names, kDifferingWord),
-                                    std::make_pair(&all.missing_names, kMissingWord),
-                                    std::make_pair(&all.unlisted_names, kUnlistedWord)}) {
-    for (const std::string& name : *names) Print(std::string("      ") + word + ": " + name);
+  const struct {
+    const std::vector<std::string>& names;
+    const char* word;
+  } parts[] = {{all.differing_names, kDifferingWord},
+               {all.missing_names, kMissingWord},
+               {all.unlisted_names, kUnlistedWord}};
+  for (const auto& [names, word] : parts) {
+    for (const std::string& name : names) Print(std::string("      ") + word + ": " + name);
   }
 }
 
