@@ -129,7 +129,7 @@ TEST(VerificationReason, SaysWhichStepOfTheVerificationFails) {
   SignatureBlock block;
   Certificate certificate;
   certificate.public_key_info =
-      PublicKeyInfoAround(der::Sequence({der::Integer(Bytes(256, 0x55)), der::Integer({1})}));
+      PublicKeyInfoAround(der::Sequence({der::Integer(Bytes(256, 0x55)), der::Integer(Bytes{1})}));
   block.certificates = certificate.Build();
   EXPECT_EQ(ReasonOf(block), Reason::kKeyRefused) << "the exponent 1 makes no signature";
   block = {};
