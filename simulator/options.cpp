@@ -15,12 +15,12 @@ namespace simulator {
 namespace {
 
 constexpr char kDescription[] =
-    "Runs apktoolkit, as it is, for each FILE inside a simulated phone, and tells\n"
-    "what the phone accepted of it, why not the rest, and what to change.";
+    "Runs the unchanged apktoolkit for each FILE inside a simulated phone. Prints\n"
+    "what the phone accepted, why it refused the rest, and what to change.";
 
 constexpr char kFooter[] =
-    "Exit status, the highest of all FILEs:\n"
-    "  0  all was signed that was to be signed\n"
+    "Exit status (of several FILEs the highest one):\n"
+    "  0  everything that had to be signed was signed\n"
     "  1  something was refused: by the tool, by a phone's installer, or by --signer\n"
     "     or --werror\n"
     "  2  the command line is wrong\n"
@@ -66,7 +66,7 @@ std::optional<int> ParseOptions(int argc, char** argv, Options* options) {
   CLI::App app(kDescription, "apktoolkit-sim");
   app.footer(kFooter);
   app.get_formatter()->column_width(28);
-  app.allow_extras();  // so that they can be named
+  app.allow_extras();  // NameUnknownOption names them
   options->installer.program = ProgramDirectory() + "/../lib/apktoolkit/installer.jar";
   std::string runner;
 
@@ -118,8 +118,8 @@ std::optional<int> ParseOptions(int argc, char** argv, Options* options) {
 
 namespace {
 
-// The command line as CLI11 takes it, from the back, with the value that an --install without one
-// stands for: the word after it is a file.
+// The command line in reverse order, as CLI11 takes it. An --install without a value gets the
+// default value, because CLI11 would take the next word, a file, for its value.
 std::vector<std::string> CommandLineOf(int argc, char** argv) {
   std::vector<std::string> words(argv + std::min(argc, 1), argv + argc);
   const auto end_of_options = std::find(words.begin(), words.end(), "--");
@@ -133,8 +133,8 @@ void AddPhone(CLI::App* app, Options* options) {
   PhoneSettings* const phone = &options->run.phone;
   app->add_option_function<std::string>(
          "--integrity", [phone](const std::string& text) { phone->integrity = Split(text, ','); },
-         "What the tool reads as its integrity value;\n"
-         "the last repeats, \"missing\" is no file\n"
+         "The tool's integrity value, one TEXT a reading;\n"
+         "the last one repeats, \"missing\" is no file\n"
          "[default: 1f]")
       ->type_name("TEXT[,TEXT]...");
   AddKernelAnswer(app, "--sign-errno", &phone->sign_errno,
@@ -143,15 +143,15 @@ void AddPhone(CLI::App* app, Options* options) {
   AddKernelAnswer(app, "--verify-errno", &phone->verify_errno,
                   "The kernel's answer for a file that it does\n"
                   "not trust [default: ENOKEY]");
-  app->add_option("--zu-result", phone->zu_result, "What libzu answers [default: 0]")
+  app->add_option("--zu-result", phone->zu_result, "The answer of libzu [default: 0]")
       ->type_name("N");
   app->add_option("--trust", options->run.trust, "The kernel trusts this file; may be repeated")
       ->check(CLI::ExistingFile.description(""))
       ->type_name("FILE")
       ->allow_extra_args(false);
   app->add_option("--state", options->run.state,
-                  "Remember in DIR what was signed, and trust it\n"
-                  "while its bytes stay the same")
+                  "Remember signed files in DIR, and trust them\n"
+                  "while their bytes stay the same")
       ->type_name("DIR");
 }
 
@@ -166,8 +166,8 @@ void AddKernelAnswer(CLI::App* app, const char* name, int* error, const char* de
 void AddFiles(CLI::App* app, Options* options) {
   FileListOptions* const files = &options->files;
   app->add_flag("--recursive", files->is_recursive,
-                "A directory stands for the packages in and\n"
-                "below it: .apk .jar .apks .xapk .apkm .aab");
+                "Take the packages in and below a directory:\n"
+                ".apk .jar .apks .xapk .apkm .aab");
   const auto is_name = [](const std::string& name) {
     return name.empty() ? "the name is empty" : std::string();
   };
@@ -194,16 +194,16 @@ void AddInstallation(CLI::App* app, Options* options) {
     return is_known ? std::string() : "there are phone, all, arm64, arm and no, and no " + name;
   };
   app->add_option_function<std::string>(kInstall, install,
-                                        "Lay the libraries out first, as an installer\n"
-                                        "does, in a directory of their own: for phone,\n"
-                                        "all, arm64 or arm; \"no\" never does that\n"
-                                        "[default: phone, if a package lies alone]")
+                                        "First lay out the libraries, as an installer\n"
+                                        "does, in a temporary directory: for phone, all,\n"
+                                        "arm64 or arm; \"no\" does not [default: phone, if\n"
+                                        "there are none beside the package]")
       ->type_name("[=ABI]")
       ->check(check)
       ->take_last();
   app->add_flag("--strict", options->judge.is_strict,
-                "A library that does not lie beside its package\n"
-                "counts as refused");
+                "A library that is not beside its package counts\n"
+                "as refused");
 }
 
 void AddInstaller(CLI::App* app, Options* options) {
@@ -219,9 +219,9 @@ void AddInstaller(CLI::App* app, Options* options) {
     return is_known ? std::string() : "there are auto, required and off, and no " + name;
   };
   app->add_option_function<std::string>("--installer", use,
-                                        "Ask also what a phone's installer says, by\n"
-                                        "apksig: auto (where it is there), required or\n"
-                                        "off [default: auto]")
+                                        "Also ask apksig, the verifier of a phone's\n"
+                                        "installer: auto (if it is installed), required\n"
+                                        "or off [default: auto]")
       ->type_name("WHEN")
       ->check(is_use)
       ->take_last();
@@ -232,7 +232,7 @@ void AddInstaller(CLI::App* app, Options* options) {
                                      : text + " is no API level and no range such as 27-33";
   };
   app->add_option_function<std::string>("--api", set,
-                                        "Whether phones of these API levels install it\n"
+                                        "Ask about phones with these API levels\n"
                                         "[default: 27 and later]")
       ->type_name("LEVEL[-LEVEL]")
       ->check(is_range);
@@ -251,7 +251,7 @@ void AddGate(CLI::App* app, Options* options) {
   };
   app->add_option_function<std::vector<std::string>>(
          "--signer", add,
-         "Refuse what is signed by another. SHA256 is the\n"
+         "Refuse packages of other signers. SHA256 is the\n"
          "digest of certificate, public key or modulus;\n"
          "may be repeated")
       ->type_name("SHA256")
@@ -272,18 +272,18 @@ void AddOutput(CLI::App* app, Options* options) {
     };
     app->add_flag_function(name, set, description);
   };
-  print("--quiet", Detail::kVerdict, "Print the verdicts alone");
+  print("--quiet", Detail::kVerdict, "Print only the verdicts");
   print("--verbose", Detail::kAll,
-        "Print also what the signature leaves out, every\n"
-        "signer, and the chain from key to entries");
+        "Also print the unprotected entries, all signers,\n"
+        "and the chain from key to entries");
   app->add_flag("--json", options->show.json, "Print the journal, one JSON object a line");
-  app->add_option("--journal", options->show.journal, "Keep the journal in FILE; - is --json")
+  app->add_option("--journal", options->show.journal, "Write the journal to FILE; - is like --json")
       ->type_name("FILE");
-  app->add_option("--junit", options->show.junit, "Write test results to FILE, as JUnit does")
+  app->add_option("--junit", options->show.junit, "Write test results to FILE, in JUnit format")
       ->type_name("FILE");
   app->add_option("--sarif", options->show.sarif, "Write results to FILE, as a SARIF 2.1.0 log")
       ->type_name("FILE");
-  app->add_option("--html", options->show.html, "Write all of it to FILE, a page for a browser")
+  app->add_option("--html", options->show.html, "Write everything to FILE, a page for browsers")
       ->type_name("FILE");
 }
 
@@ -292,11 +292,11 @@ void AddRun(CLI::App* app, Options* options, std::string* runner) {
   const auto is_number = [](const std::string& text) {
     return std::isnan(strtod(text.c_str(), nullptr)) ? text + " is no number" : std::string();
   };
-  app->add_option("--jobs", options->run.jobs, "Look at so many files at a time [default: 1]")
+  app->add_option("--jobs", options->run.jobs, "Look at N files at the same time [default: 1]")
       ->type_name("N")
       ->check(CLI::Range(1, 1024).description(""));
   app->add_option("--timeout", options->run.timeout,
-                  "Give up a file that takes longer\n"
+                  "Stop the tool if it takes longer for a file\n"
                   "[default: 30]")
       ->type_name("SECONDS")
       ->check(CLI::Range(0.001, 1e6).description(""))
@@ -306,23 +306,23 @@ void AddRun(CLI::App* app, Options* options, std::string* runner) {
                   "beside this program]")
       ->type_name("PATH");
   app->add_option("--runner", *runner,
-                  "Words to put before the tool: an emulator that\n"
-                  "takes -E NAME=VALUE [default: none]")
+                  "Put these words before the tool: an emulator\n"
+                  "that takes -E NAME=VALUE [default: none]")
       ->type_name("COMMAND")
       ->take_last();
 }
 
-// Nothing is signed then, so the options for verdicts have no meaning.
+// With --verify nothing is signed. Options for verdicts have no meaning then.
 void AddVerify(CLI::App* app, Options* options) {
   CLI::Option* const verify = app->add_flag("--verify", options->verify,
-                                            "Sign nothing: ask the kernel which FILEs it\n"
-                                            "trusts, by the apktoolkit-verify beside this\n"
-                                            "program");
+                                            "Sign nothing. Run the apktoolkit-verify beside\n"
+                                            "this program: it asks the kernel which FILEs it\n"
+                                            "trusts");
   for (const char* name : {"--signer", "--werror", "--strict", "--recursive", "--quiet",
                            "--verbose", "--html", "--junit", "--sarif"}) {
     verify->excludes(app->get_option(name));
   }
-  verify->option_text(" ");  // in place of all that it excludes, which is too long for a line
+  verify->option_text(" ");  // replaces the list of excluded options, too long for a line
 }
 
 // A word that begins with "-" and does not name an option may be the name of a file.
@@ -341,7 +341,7 @@ int MissFile() {
   return kUsageError;
 }
 
-// LEVEL, LEVEL-LEVEL or LEVEL-, of which the last has no end.
+// Reads LEVEL, LEVEL-LEVEL or LEVEL-. The last form has no upper end.
 bool ReadLevels(const std::string& text, LevelRange* levels) {
   constexpr size_t kMostDigits = 5;
   const std::vector<std::string> parts = Split(text, '-');
@@ -357,9 +357,9 @@ bool ReadLevels(const std::string& text, LevelRange* levels) {
   return levels->first >= 1 && levels->first <= levels->last;
 }
 
-// 0 when no error has this name.
+// Returns 0 if no error has this name.
 int ErrorNumber(const std::string& name) {
-  constexpr int kLast = 4095;  // the highest that a system call can answer
+  constexpr int kLast = 4095;  // the highest errno that a system call can return
   for (int error = 1; error <= kLast; ++error) {
     const char* const known = strerrorname_np(error);
     if (known != nullptr && name == known) return error;

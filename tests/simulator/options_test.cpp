@@ -276,7 +276,7 @@ TEST(Options, HelpNamesEveryOptionAndStatus) {
                            "--runner COMMAND",
                            "--help ",
                            "--version ",
-                           "\n  0  all was",
+                           "\n  0  everything ",
                            "\n  1  ",
                            "\n  2  ",
                            "\n  3  ",
