@@ -21,11 +21,11 @@ struct Options {
   GateOptions gate;
   ShowOptions show;
   bool verify = false;    // ask the kernel which files it trusts, and nothing else
-  FileListOptions files;  // what the tool is run for: at least one name or a list
+  FileListOptions files;  // the files for the tool: at least one name or a list
 };
 
-// Fills `options` from the command line. When the program should end instead, because of `--help`
-// or of a mistake, which has then been reported, the result is its exit status.
+// Fills `options` from the command line. Returns the exit status if the program must end instead:
+// after `--help` or `--version`, or after an error, which is already printed.
 std::optional<int> ParseOptions(int argc, char** argv, Options* options);
 
 }  // namespace simulator

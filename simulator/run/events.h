@@ -10,21 +10,21 @@ namespace simulator {
 
 using Events = std::vector<nlohmann::json>;
 
-// The events of a journal's lines. Lines that are not JSON come from elsewhere and do not count.
+// The events of a journal's lines. Lines that are not JSON come from elsewhere and are skipped.
 Events ParseEvents(const std::string& journal);
 
-// The value of `event` under `key`: a text as its original bytes, or a number. Empty, or 0, when
-// the key is missing.
+// The value of `event` under `key`: a text as its original bytes, or a number. Returns an empty
+// text, or 0, if the key is missing.
 std::string TextOf(const nlohmann::json& event, const char* key);
 int64_t NumberOf(const nlohmann::json& event, const char* key);
 
-// Whether the answer in `event`, of the kernel or libzu, is 0.
+// True if the answer in `event`, of the kernel or libzu, is 0.
 bool IsSuccess(const nlohmann::json& event);
 
-// Whether `event` tells of the run. The others are there for the journal's own sake.
+// True if `event` describes the run. The others describe the journal itself.
 bool IsOfTheRun(const nlohmann::json& event);
 
-// Such as "ENOKEY: Required key not available".
+// Returns a text such as "ENOKEY: Required key not available".
 std::string DescribeErrno(int64_t error);
 
 }  // namespace simulator

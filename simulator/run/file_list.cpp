@@ -54,7 +54,7 @@ std::optional<std::string> ReadNames(const FileListOptions& options,
   if (!ReadAll(options.list, &content)) {
     return "cannot read " + title + ": " + strerrordesc_np(errno);
   }
-  // A file's name has none, and what follows it would be lost.
+  // A file name cannot contain a NUL byte. The system would cut the name there.
   if (!options.has_nul && content.find('\0') != std::string::npos) {
     return title + " has NUL bytes; with -0 they end its names";
   }
@@ -66,7 +66,7 @@ std::optional<std::string> ReadNames(const FileListOptions& options,
   return {};
 }
 
-// False with errno set.
+// Returns false with errno set if the file cannot be read.
 bool ReadAll(const std::string& file, std::string* content) {
   constexpr size_t kPart = 1 << 16;
   const bool is_standard_input = file == "-";
@@ -101,8 +101,8 @@ void Walk(const std::string& root, FileList* list) {
   std::move(found.begin(), found.end(), std::back_inserter(list->files));
 }
 
-// A link to a directory is neither walked nor a file. An entry whose kind cannot be read counts as
-// a directory that cannot be read: its path is too long, for example.
+// Skips links to directories. If the kind of an entry cannot be read, for example because its path
+// is too long, the entry is listed as unreadable.
 void AddEntry(const fs::directory_entry& entry, std::vector<std::string>* directories,
               std::vector<ListedFile>* found, size_t* others) {
   std::error_code error;

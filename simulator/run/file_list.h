@@ -1,5 +1,5 @@
-// The files that the tool is run for: named on the command line or in a list, or found below a
-// directory. Everything is listed before the first run.
+// The files for which the tool is run. They are named on the command line or in a list, or found
+// below a directory. All files are listed before the first run.
 #pragma once
 
 #include <cstddef>
@@ -10,17 +10,17 @@
 namespace simulator {
 
 struct FileListOptions {
-  std::vector<std::string> names;  // of the command line
+  std::vector<std::string> names;  // from the command line
   std::string list;                // a file with more names, "-": standard input; empty: none
-  bool has_nul = false;            // a name of the list ends with a NUL byte, else with its line
-  bool is_recursive = false;       // a directory stands for the packages below it
+  bool has_nul = false;            // names in the list end with NUL bytes, else with line feeds
+  bool is_recursive = false;       // directories are replaced by the packages below them
 };
 
 struct ListedFile {
   enum class State {
     kToRun,            // the tool is run for it
-    kUnreadable,       // below a walked directory, and cannot be read to its end: `error`
-    kWithoutPackages,  // a directory that is walked, with no package in it or below it
+    kUnreadable,       // a walked directory or an entry in it that cannot be read: see `error`
+    kWithoutPackages,  // a walked directory with no package in it or below it
   };
 
   std::string name;
@@ -30,15 +30,16 @@ struct ListedFile {
 
 struct FileList {
   std::vector<ListedFile> files;
-  size_t others = 0;  // files below the walked directories that have no package's name
+  size_t others = 0;  // files below walked directories whose names are not those of packages
 };
 
 // Lists the files of the command line and then those of the list, in their order. With
-// `is_recursive` a directory stands for the files below it whose names are a package's
-// (IsPackageName), sorted by their paths, byte by byte. Symbolic links to directories are followed
-// if they are named, and not if they are met on the walk. Empty names of a list do not count.
-// None when that is done; else why it cannot be: the list cannot be read, names nothing, or has NUL
-// bytes where its names end with a line.
+// `is_recursive` a directory is replaced by the files below it with package names (IsPackageName),
+// sorted by their paths, byte by byte. Symbolic links to directories are followed if they are
+// named, but not if the walk finds them. Empty names in a list are skipped.
+//
+// Returns none on success, else the reason of the failure: the list cannot be read, has no names,
+// or has NUL bytes although its names end with line feeds.
 std::optional<std::string> ListFiles(const FileListOptions& options, FileList* list);
 
 }  // namespace simulator

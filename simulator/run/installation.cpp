@@ -31,7 +31,7 @@ namespace fs = std::filesystem;
 constexpr const char* kPhoneAbis[] = {"arm64-v8a", "armeabi-v7a", "armeabi"};
 constexpr char kArm64Directory[] = "lib/arm64";
 
-// Each path below the package's directory, with the entry that it comes from.
+// Paths below the package's directory, each with the entry that is extracted to it.
 using Layout = std::map<std::string, std::string>;
 
 std::vector<std::string> LibraryNames(const Archive& archive);
@@ -81,7 +81,7 @@ std::optional<std::string> Installation::LayOut(const std::string& file, Install
     return failure(fs::path(directory).parent_path().string(), errno);
   }
   directory_ = fs::canonical(directory, error).string();
-  // Always under this name, since a library's directory has another one.
+  // No library can have this path: libraries are laid out below lib/.
   const std::string copy = directory_ + "/base.apk";
   if (!PutPackage(file, source.get(), copy, deadline)) {
     return failure(std::string(kInstalledDirectory) + "base.apk", errno);
@@ -101,8 +101,8 @@ std::optional<std::string> Installation::LayOut(const std::string& file, Install
   return {};
 }
 
-// The name of the directory could not be known before it was made, so it stands in no name of the
-// package's.
+// Replaces the directory's name wherever it occurs. The name is random, so the package's own names
+// cannot contain it.
 std::string Installation::WithStablePaths(const std::string& journal) const {
   if (directory_.empty()) return journal;
   const std::string quoted = EncodeText(directory_ + "/");
@@ -118,7 +118,7 @@ std::string Installation::WithStablePaths(const std::string& journal) const {
 
 namespace {
 
-// Of damaged entries as well.
+// Damaged entries count as well.
 std::vector<std::string> LibraryNames(const Archive& archive) {
   std::vector<std::string> names;
   for (const ArchiveEntry& entry : archive.Entries()) {
@@ -127,9 +127,9 @@ std::vector<std::string> LibraryNames(const Archive& archive) {
   return names;
 }
 
-// Neither a directory of the installer's nor a place where the tool looks for a library is there.
-// Looked for beside the open file, as the tool does, and not beside a link to it. A file on a
-// read-only file system is left to the tool, which has an answer of its own for it.
+// True if neither a directory of the installer nor a path at which the tool looks for a library
+// exists. Like the tool, it looks beside the open file, not beside a link to it. Returns false for
+// a file on a read-only file system, because the tool leaves it alone.
 bool LiesAlone(int package, const std::vector<std::string>& libraries) {
   const std::string file = GetFilenameByFd(package);
   struct statvfs system = {};
@@ -149,13 +149,12 @@ bool LiesAlone(int package, const std::vector<std::string>& libraries) {
   });
 }
 
-// One library of a name for each kind of processor: of two ABIs for the same one, an installer
-// takes the first that the package has. Other processors' libraries are not for this phone and left
-// alone.
+// An installer uses one ABI for each kind of processor: of two ABIs for the same kind, the first
+// that the package has. The libraries of other processors are not for this phone and are left out.
 Layout PlanLayout(const std::vector<std::string>& entries, InstalledAbi choice,
                   std::vector<std::string>* left_out, std::set<std::string>* of_other_processors) {
   Layout layout;
-  std::set<std::string> taken;  // the directories that have libraries
+  std::set<std::string> taken;  // directories below which libraries are laid out
   for (const char* const abi : kPhoneAbis) {
     const std::string abi_directory = kLibraryNames.prefix + std::string(abi);
     const std::string installed = ApkTools::InstalledLibraryPath("", abi_directory);
@@ -179,7 +178,7 @@ Layout PlanLayout(const std::vector<std::string>& entries, InstalledAbi choice,
   return layout;
 }
 
-// lib/ABI/FILE, so that no name leads out of its directory.
+// True for lib/ABI/FILE. No name of this form leads out of its directory.
 bool IsNameForInstallers(const std::string& entry) {
   const size_t slash = entry.find('/', strlen(kLibraryNames.prefix));
   return slash != std::string::npos && entry.find('/', slash + 1) == std::string::npos &&
@@ -191,8 +190,8 @@ bool Wants(InstalledAbi choice, bool is_arm64, bool has_arm64) {
   return choice == InstalledAbi::kAll || (choice == InstalledAbi::kArm64) == is_arm64;
 }
 
-// The package itself under another name where the file system allows it, else a copy. False with
-// errno set, as below.
+// Makes a hard link to the package if the file system allows it, else a copy. Returns false with
+// errno set.
 bool PutPackage(const std::string& file, int source, const std::string& copy,
                 const Deadline& deadline) {
   constexpr size_t kPart = 1 << 20;
@@ -210,7 +209,7 @@ bool PutPackage(const std::string& file, int source, const std::string& copy,
   return size == 0;
 }
 
-// Returns 0, the errno of the new file, or -1 when it is the entry that cannot be extracted.
+// Returns 0, the errno of a failure to write the file, or -1 if the entry cannot be extracted.
 int Extract(const Archive& archive, const std::string& entry, const std::string& path,
             const Deadline& deadline) {
   constexpr mode_t kMode = 0755;

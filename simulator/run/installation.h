@@ -1,5 +1,5 @@
-// A package laid out as an installer does it: in a directory of its own, with its native libraries
-// beside it. The directory is gone with this object.
+// A package laid out as an installer does it: in a temporary directory, with its native libraries
+// beside it. The destructor removes the directory.
 #pragma once
 
 #include <optional>
@@ -11,9 +11,9 @@
 
 namespace simulator {
 
-// Whose libraries are laid out.
+// The processors whose libraries are laid out.
 enum class InstalledAbi {
-  kPreferred,  // of 64-bit Arm, where the package has any; else of 32-bit Arm
+  kPreferred,  // 64-bit Arm if the package has libraries for it, else 32-bit Arm
   kAll,
   kArm64,
   kArm,
@@ -21,14 +21,14 @@ enum class InstalledAbi {
 
 // Which packages are laid out.
 enum class InstallWhen {
-  kAlone,   // those that have library entries, and none of the places where the tool looks for
-            // them is there; not on a read-only file system
+  kAlone,   // packages with library entries, if nothing exists at the places where the tool looks
+            // for the libraries; not on a read-only file system
   kAlways,  // all
   kNever,
 };
 
-// The output has this in place of the directory of an installation, whose name differs in each run.
-// A path of the kernel's begins with "/", so that none of a file begins like this.
+// The output shows this instead of the installation's directory, whose name differs in each run.
+// No path of a file begins like this, because paths from the kernel begin with "/".
 inline constexpr char kInstalledDirectory[] = "<install>/";
 
 class Installation {
@@ -38,22 +38,22 @@ class Installation {
   Installation(const Installation&) = delete;
   Installation& operator=(const Installation&) = delete;
 
-  // Lays out the package at `file`. A file that is not a package, keeps its libraries, or has none
-  // to lay out, stays where it is; so does one that does not lie alone, where `when` asks for that.
-  // None when that is done, else why it cannot be.
+  // Lays out the package at `file`. The file stays at its place if it is not a package, keeps its
+  // libraries inside, or has no libraries to lay out, or if `when` excludes it. Returns none on
+  // success, else the reason of the failure.
   std::optional<std::string> LayOut(const std::string& file, InstallWhen when, InstalledAbi abi,
                                     const Deadline& deadline);
 
-  // Where the package lies now.
+  // The path of the package for the tool: in the directory, or `file`.
   const std::string& path() const { return path_; }
-  // It was laid out, and does not lie where it was.
+  // True if the package was laid out.
   bool is_done() const { return is_done_; }
-  // A journal with kInstalledDirectory in place of this installation's own: so that it is the same
-  // in each run.
+  // The journal with kInstalledDirectory instead of the name of this directory, so that it is the
+  // same in each run.
   std::string WithStablePaths(const std::string& journal) const;
   // The library entries of processors that were not asked for.
   const std::set<std::string>& of_other_processors() const { return of_other_processors_; }
-  // The library entries whose names an installer does not take, and those that it would take and
+  // The library entries whose names an installer does not take, and those that it would take but
   // cannot extract.
   const std::vector<std::string>& left_out() const { return left_out_; }
   const std::vector<std::string>& not_extracted() const { return not_extracted_; }

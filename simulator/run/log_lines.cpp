@@ -14,7 +14,8 @@ namespace {
 
 constexpr size_t kNothing = SIZE_MAX;
 
-// As the tool's sources have the text; `captured` counts its conversions from 0.
+// The format texts of the tool's sources. `captured` is the index of the conversion to capture,
+// counted from 0.
 constexpr struct LogText {
   LogMeaning meaning;
   const char* format;
@@ -63,12 +64,12 @@ constexpr struct LogText {
     {LogMeaning::kRegistrationFailed, "ZuAddCertificate: ZuNewCertificate failed %d.\n", kNothing},
 };
 
-// A row made ready for comparing.
+// A row of the table, prepared for comparisons.
 struct Pattern {
   const LogText* row;
-  std::string start;  // all before the first conversion
+  std::string start;  // the text before the first conversion
   std::regex whole;
-  char conversion;  // of what is captured
+  char conversion;  // the captured one
 };
 
 const std::vector<Pattern>& Patterns();
@@ -79,7 +80,7 @@ Pattern MakePattern(const LogText& row);
 LogLine ReadLogLine(const std::string& text) {
   LogLine line;
   line.whole = text.substr(0, text.size() - (!text.empty() && text.back() == '\n' ? 1 : 0));
-  // A line of this length was cut, and is known by its start alone.
+  // The log cut a line of this length, so only its start can be compared.
   const bool is_cut = text.size() + 1 >= kLogTextSize;
   for (const Pattern& pattern : Patterns()) {
     const std::string& start = pattern.start;

@@ -1,5 +1,5 @@
-// The texts of the tool's log that are understood here: the one table of them. A test holds it
-// against the tool's sources.
+// The texts of the tool's log that the simulator understands, in one table. A test compares it with
+// the tool's sources.
 #pragma once
 
 #include <cstdint>
@@ -8,13 +8,13 @@
 
 namespace simulator {
 
-// The meaning of a record of the tool's log. A comment behind it names the captured parts, if there
-// are any.
+// The meaning of a record of the tool's log. The comment above a group names the captured parts, if
+// there are any.
 enum class LogMeaning {
-  // None of the texts; a detail of an error that another record names as well.
+  // None of the texts; a detail of an error that another record also names.
   kUnknown,
   kDetail,
-  // The steps of a run: what is taken up is to be signed, the package or one of its libraries.
+  // The steps of a run. "Taken up": the tool starts to sign the package, or one of its libraries.
   kLibrariesBegin,
   kFileBegins,
   kFileEnds,
@@ -37,8 +37,8 @@ enum class LogMeaning {
   kAndroidManifestMalformed,
   kNoGoodPackage,
   kNoArchiveToSign,
-  // Reasons why a library or the dex file is not good. Captured are the library's path and errno,
-  // which comes in the record behind.
+  // Reasons why a library or the dex file is not good. Captured are the library's path, and errno
+  // from the next record.
   kFileNotOpened,
   kFileNotRead,
   kNotListed,
@@ -56,14 +56,14 @@ enum class LogMeaning {
 struct LogLine {
   LogMeaning meaning = LogMeaning::kUnknown;
   std::string whole;  // without its line end
-  std::string text;   // what is captured
+  std::string text;   // the captured part
   int64_t number = 0;
 };
 
-// A record's text, complete or cut as the log cuts what is too long.
+// Reads a record's text. It may be cut, as the log cuts texts that are too long.
 LogLine ReadLogLine(const std::string& text);
 
-// The first line of this meaning; null when no line has it.
+// The first line with this meaning; null if no line has it.
 const LogLine* FindError(const std::vector<LogLine>& lines, LogMeaning meaning);
 
 }  // namespace simulator

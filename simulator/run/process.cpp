@@ -18,14 +18,14 @@ void Catch(int signal) { caught = signal; }
 
 }  // namespace
 
-// The descriptor in its place is closed by exec and cannot be written to, because output that
-// nobody gets is a failure.
+// /dev/null replaces a closed stream. It is read-only, because output that nobody gets must fail.
+// exec closes it, so that started programs find the stream closed, as it was.
 bool KeepStandardStreams() {
   const bool has_input = fcntl(STDIN_FILENO, F_GETFD) >= 0;
   for (const int stream : {STDIN_FILENO, STDOUT_FILENO, STDERR_FILENO}) {
     if (fcntl(stream, F_GETFD) < 0) open("/dev/null", O_RDONLY | O_CLOEXEC);
   }
-  // The stream that std::cout keeps is the one that there is now.
+  // std::cout keeps the standard output of this moment; other output goes to /dev/null.
   std::ios::sync_with_stdio(false);
   if (FILE* const nowhere = fopen("/dev/null", "we")) stdout = nowhere;
   return has_input;

@@ -5,25 +5,25 @@
 
 namespace simulator {
 
-// Sees to it that no file of this program's gets the place of a standard stream that was closed.
-// Whether there was a standard input; programs that are started from here find it as it was.
-// std::cout writes to standard output, and nothing else does: what the tool's own code prints in
-// this process goes nowhere. To be called before anything is printed.
+// Reserves the descriptors of closed standard streams, so that no file of this program gets one.
+// Returns true if there was a standard input. Programs that this process starts find it as it was.
+// Afterwards only std::cout writes to standard output: other output of the tool's own code in this
+// process is discarded. Call it before anything is printed.
 bool KeepStandardStreams();
 
-// From here on, an interruption from the keyboard or a request to end does not end the process
+// After this call, an interruption from the keyboard or a request to end does not end the process
 // before it has cleaned up.
 void CatchInterruptions();
 bool IsInterrupted();
-// Ends the process by the signal that came, if one came.
+// If a signal was caught, ends the process by that signal.
 void EndIfInterrupted();
 
-// Until when a file may keep the simulator busy.
+// The time limit for the work on one file.
 class Deadline {
  public:
   explicit Deadline(double seconds) : end_(Clock::now() + Seconds(seconds)) {}
 
-  // The time is up, or this process is to end.
+  // True if the time is up, or this process was interrupted.
   bool HasPassed() const { return Clock::now() >= end_ || IsInterrupted(); }
 
  private:

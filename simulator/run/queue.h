@@ -1,4 +1,4 @@
-// Doing something for many files, several at a time, and telling of them in their order.
+// Works on several files at a time, and delivers the results in the order of the files.
 #pragma once
 
 #include <cstddef>
@@ -6,10 +6,10 @@
 
 namespace simulator {
 
-// Calls `run` for each number below `count`, in `jobs` threads, and in this one `done` for each, in
-// order, as soon as its turn has come. While one takes longer than a second, `waiting` is called
-// now and then with its number and the seconds. Ends early when the process is interrupted; `done`
-// is called for nothing that did not end.
+// Calls `run` for each number below `count`, in `jobs` threads. Calls `done` in this thread, in the
+// order of the numbers, for each number whose `run` has ended. While it waits longer than a second
+// for a number, it calls `waiting` from time to time with the number and the seconds. Ends early if
+// the process is interrupted; `done` is never called for a number whose `run` did not end.
 void RunInOrder(size_t count, unsigned jobs, const std::function<void(size_t number)>& run,
                 const std::function<void(size_t number)>& done,
                 const std::function<void(size_t number, int seconds)>& waiting);

@@ -1,5 +1,5 @@
-// A run of the tool, taken apart: which error belongs to which file. Made from the journal's events
-// and nothing else, but for what stands last in the record.
+// A run of the tool: its events, sorted by the file to which each belongs. TakeApart makes it from
+// the journal's events alone. Only the last members of RunRecord come from elsewhere.
 #pragma once
 
 #include <cstdint>
@@ -13,26 +13,26 @@
 
 namespace simulator {
 
-// One file that the tool took up, to have it signed.
+// The attempt to sign one file.
 struct Attempt {
   enum class Outcome {
-    kBegun,  // and nothing came of it
+    kBegun,  // the tool began, and no result is known
     kSigned,
     kKernelRefused,
-    kNotAsked,     // the tool may not sign: `integrity` tells
-    kNotVerified,  // a library: `why` tells
-    kVanished,     // a library, after it was verified
+    kNotAsked,     // the tool may not sign: see `integrity`
+    kNotVerified,  // a library: see `why`
+    kVanished,     // a library that could not be opened again after its check
   };
 
-  std::string path;  // as log or kernel told; may be empty
+  std::string path;  // from the log or the kernel; may be empty
   Outcome outcome = Outcome::kBegun;
   int64_t error = 0;                      // the kernel's errno, or that of opening
-  std::string payload;                    // that the kernel was handed, in hexadecimal
+  std::string payload;                    // the bytes that the kernel got, in hexadecimal
   std::optional<std::string> integrity;   // the tool's own value, as read last; none: no file
   LogMeaning why = LogMeaning::kUnknown;  // of the first error logged before, if any
 };
 
-// Why a run tells nothing of the file.
+// Why a run has no result for the file.
 struct Failure {
   enum class Kind {
     kNone,
@@ -50,22 +50,22 @@ struct Failure {
 
 // Which tool ran.
 struct ToolIdentity {
-  bool is_own = false;  // the one beside the simulator, which is of the simulator's version
+  bool is_own = false;  // the tool beside the simulator, which has the simulator's version
   std::string sha256;   // of its bytes, in lower-case hexadecimal; empty: they cannot be read
 };
 
 struct RunRecord {
-  Events events;  // all that happened, in order
+  Events events;  // all events, in order
   std::string file;
   std::string path;
   std::string installed;  // of a package that was laid out: <install>/base.apk; else empty
-  bool is_silent = true;  // the tool neither said nor did anything
+  bool is_silent = true;  // the tool logged nothing and asked the phone for nothing
 
   std::vector<LogLine> opening_errors;  // before the first step
   bool is_dex_refused = false;
   LogMeaning dex_why = LogMeaning::kUnknown;  // of the first error logged before, if any
   std::vector<Attempt> libraries;             // in order
-  std::optional<Attempt> own;           // the file itself, where the kernel was or should be asked
+  std::optional<Attempt> own;           // the file itself; none: the tool did not come to sign it
   std::optional<int64_t> verify_error;  // a plain JAR: 0, or why the kernel does not trust it
   bool is_jar = false;
 
@@ -77,22 +77,22 @@ struct RunRecord {
   bool is_key_refused_with_package = false;
   bool has_no_key_path = false;
 
-  std::vector<std::string> other_errors;  // that belong to nothing of the above
-  std::optional<int64_t> signal;          // that the tool was killed by
+  std::vector<std::string> other_errors;  // errors that belong to none of the members above
+  std::optional<int64_t> signal;          // the signal that killed the tool
   int64_t status = 0;
 
-  // Facts that the simulator itself knows of the run.
+  // Facts about the run that the journal does not have.
   Failure failure;
   ToolIdentity tool;
   bool has_standard_input = true;  // the tool was started with one
-  bool has_no_packages = false;    // a directory that was walked for them; the tool was not run
-  // The library entries of a package that is laid out: of processors that were not asked for; that
-  // no installer takes, for their names; that cannot be extracted.
+  bool has_no_packages = false;    // a directory without packages; the tool was not run
+  // Library entries of a package that is laid out: those of processors that were not asked for;
+  // those that no installer takes because of their names; those that cannot be extracted.
   std::set<std::string> of_other_processors;
   std::vector<std::string> not_laid_out;
   std::vector<std::string> not_extracted;
 
-  // As the tool was told.
+  // The path that the tool got.
   const std::string& PathForTool() const { return installed.empty() ? path : installed; }
 };
 

@@ -1,5 +1,5 @@
-// One phone for all the files of a command line: what its kernel has signed so far, and the runs of
-// the tool inside it.
+// One phone for all files of a command line. It remembers which files its kernel has signed, and
+// runs the tool for each file.
 #pragma once
 
 #include <optional>
@@ -20,7 +20,7 @@ namespace simulator {
 struct RunOptions {
   PhoneSettings phone;             // all but its journal and its trusted files
   std::vector<std::string> trust;  // existing files that the kernel trusts
-  std::string state;               // the directory that remembers what was signed; may be empty
+  std::string state;               // the directory for --state; may be empty
   InstallWhen install = InstallWhen::kAlone;
   InstalledAbi abi = InstalledAbi::kPreferred;  // whose libraries are laid out
   unsigned jobs = 1;                            // how many files at a time
@@ -30,7 +30,7 @@ struct RunOptions {
   double timeout = 30;                          // seconds, for each file
 };
 
-// The results of one run, from which it is judged.
+// The results of one run. MakeReport judges them.
 struct FileRun {
   RunRecord record;
   PackageFacts facts;   // of the file where the tool found it
@@ -41,16 +41,16 @@ class Simulator {
  public:
   Simulator(const RunOptions& options, bool has_standard_input);
 
-  // Opens the state and looks for the stand-ins and the tool. None when the simulation can begin,
-  // else why it cannot.
+  // Opens the state directory and looks for the stand-ins and the tool. Returns none if the
+  // simulation can begin, else the reason why it cannot.
   std::optional<std::string> Prepare();
 
-  // Runs the tool for `file`, unless that is a directory with nothing to run it for. May be called
-  // from several threads when the options have several jobs.
+  // Runs the tool for `file`. Does not run it for a walked directory without packages, or that
+  // cannot be read. Several threads may call it if the options have several jobs.
   FileRun Run(const ListedFile& file);
 
  private:
-  // One run on its way: what it needs, and why it failed.
+  // One run in progress: its time limit, journal and path, and why it failed.
   struct Task;
 
   void RunToolFor(const std::string& file, Task* task);
