@@ -20,7 +20,7 @@ struct LevelRange {
 // The last level of a range that has no end.
 inline constexpr int kNewestLevel = INT_MAX;
 
-// An error or a warning, as apksig has it.
+// An error or a warning of apksig.
 struct InstallerIssue {
   std::string name;  // such as "JAR_SIG_ZIP_ENTRY_NOT_SIGNED"
   std::vector<std::string> parameters;
@@ -37,8 +37,8 @@ struct InstallerSigner {
 struct RangeJudgement {
   LevelRange levels = {0, 0};
   bool is_verified = false;
-  std::vector<std::string> schemes;      // that were verified, the oldest first
-  std::vector<InstallerSigner> signers;  // of these, in the same order
+  std::vector<std::string> schemes;      // the verified ones, the oldest first
+  std::vector<InstallerSigner> signers;  // the signers of these schemes, in the same order
   std::vector<InstallerIssue> errors;
   std::vector<InstallerIssue> warnings;
 };
@@ -47,13 +47,13 @@ struct Judgement {
   enum class State {
     kNotAsked,  // nobody asked, or the file is not a package
     kMissing,   // the verifier is not installed
-    kGaveUp,    // the verifier did not survive the file, or had no answer
+    kGaveUp,    // the verifier crashed on the file, or gave no valid answer
     kJudged,
   };
 
   State state = State::kNotAsked;
   std::string why;                     // of kMissing and kGaveUp
-  std::vector<RangeJudgement> ranges;  // by their levels; of neighbours not the same is said
+  std::vector<RangeJudgement> ranges;  // sorted by level; neighbours have different judgements
 };
 
 // The answer in one line of the verifier: kJudged or kGaveUp.

@@ -1,7 +1,7 @@
-// Why something was not signed, and what to do: the one table of it. A row says all about a cause;
-// the tables in docs/messages.md and the codes in docs/journal.schema.json are written from the
-// rows (tests/project/messages_test.py --write). A code never changes its meaning: scripts go by
-// it.
+// The table of causes: why something was not signed, and what to do. A row has all facts about a
+// cause. The tables in docs/messages.md and the codes in docs/journal.schema.json are written from
+// the rows (tests/project/messages_test.py --write). A code never changes its meaning, because
+// scripts match on it.
 #pragma once
 
 namespace simulator {
@@ -10,7 +10,7 @@ namespace simulator {
 enum class Group {
   kNotLookedAt,  // the tool did not look at the file
   kSimulation,   // the simulation could not tell
-  kFile,         // what the file is
+  kFile,         // the kind of the file
   kSignature,    // a package's signature
   kKernel,
   kLibrary,
@@ -18,38 +18,38 @@ enum class Group {
   kTool,
   kInstaller,  // a phone's installer would not take the package
   kGate,       // the command line demands something else
-  kWarning,    // all may be signed, and yet
+  kWarning,    // a fact that deserves a second look, even if everything was signed
 };
 
 // The effect of a cause on its item.
 enum class Severity {
-  kFailed,   // nothing is told of the file
+  kFailed,   // there is no result for the file
   kUnseen,   // the tool left the file alone
-  kRefused,  // it should have been signed or registered, and was not
-  kFollows,  // the same, and something else has to be cured for it
+  kRefused,  // it should have been signed or registered, but was not
+  kFollows,  // the same, as a consequence of another cause that must be fixed first
   kAbsent,   // there is nothing to sign; a refusal under --strict
   kNothing,  // there is nothing to sign
   kDoubt,    // a warning; a refusal under --strict
   kWarning,
-  kAlarm,  // a warning that stands in the line of the verdict as well
+  kAlarm,  // a warning that the verdict's line also shows
 };
 
-// The links of the chain from the key to the entries, each of which vouches for the next.
+// The links of the chain from the key to the entries. Each link vouches for the next one.
 enum class ChainLink { kKey, kCertificate, kSignatureFile, kManifest, kEntries, kNone };
 
 struct Cause {
   const char* code;
   Group group;
   Severity severity;
-  ChainLink link;      // at which the cause breaks the chain; kNone: it breaks none
-  const char* log;     // the messages that it is known by, for docs/messages.md
-  const char* reason;  // the end of a sentence such as "not signed: …"; "%s" is filled in
+  ChainLink link;      // the link that the cause breaks; kNone: it breaks none
+  const char* log;     // the messages that show it in the log, for docs/messages.md
+  const char* reason;  // the end of a sentence such as "not signed: …"; "%s" is replaced
   const char* cure;    // one or more sentences
 };
 
 namespace cause {
 
-// The rows are filled to the line's end.
+// The rows use the full line length, which clang-format would change.
 // clang-format off
 
 // ---- The tool did not look at the file.
@@ -104,7 +104,7 @@ inline constexpr Cause kNotBegun = {"not-begun", Group::kSimulation, Severity::k
 inline constexpr Cause kInterrupted = {"interrupted", Group::kSimulation, Severity::kFailed,
     ChainLink::kKey, "", "it was interrupted", "Run it again."};
 
-// ---- What the file is.
+// ---- The kind of the file.
 inline constexpr Cause kFolder = {"folder", Group::kFile, Severity::kRefused, ChainLink::kKey,
     "`OpenArchiveFd(`", "it is a directory",
     "Name the package inside it, or give --recursive."};
@@ -413,7 +413,7 @@ inline constexpr Cause kWarningsRefused = {"warnings-refused", Group::kGate, Sev
     ChainLink::kNone, "", "a warning counts as a refusal (--werror): %s",
     "See what to do about each warning."};
 
-// ---- Warnings: all may be signed, and yet.
+// ---- Warnings: facts that deserve a second look, even if everything was signed.
 inline constexpr Cause kOtherKey = {"other-key", Group::kWarning, Severity::kWarning,
     ChainLink::kNone, "", "%s is of another key than the JAR signature: phones install the package "
     "for that key, and the kernel gets this one", "Sign it with one key for all schemes; a rotated "

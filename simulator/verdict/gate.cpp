@@ -120,7 +120,7 @@ void Refuse(ItemKind kind, const char* name, const Reason& reason, Report* repor
   if (StatusOf(report->verdict) == kAllSigned) report->verdict = Verdict::kNotAccepted;
 }
 
-// As the kernel knows him. The certificate counts only if it shows the key that the kernel gets.
+// The signer that the kernel knows. The certificate counts only if it shows the kernel's key.
 CertificateFacts JarSigner(const Report& report) {
   CertificateFacts signer;
   const std::string modulus = report.key ? report.key->sha256 : "";
@@ -129,7 +129,7 @@ CertificateFacts JarSigner(const Report& report) {
   return signer;
 }
 
-// Those of the scheme that phones of these levels go by.
+// The signers of the newest scheme that phones of these levels verify.
 std::vector<const CertificateFacts*> NewestSigners(const RangeJudgement& range) {
   std::vector<const CertificateFacts*> signers;
   if (!range.is_verified) return signers;
@@ -139,7 +139,7 @@ std::vector<const CertificateFacts*> NewestSigners(const RangeJudgement& range) 
   return signers;
 }
 
-// For whom the newest of the phones that take the package install it.
+// The signers for whom phones install the package: those of the newest phones that take it.
 std::vector<CertificateFacts> InstalledSigners(const Judgement& judgement) {
   std::vector<CertificateFacts> signers;
   for (const RangeJudgement& range : judgement.ranges) {
@@ -150,7 +150,7 @@ std::vector<CertificateFacts> InstalledSigners(const Judgement& judgement) {
   return signers;
 }
 
-// A signature with it says of nobody that he signed.
+// A signature with such a key does not prove who signed.
 bool HasForgeableKey(const Report& report) {
   return std::any_of(report.warnings.begin(), report.warnings.end(),
                      [](const Reason& warning) { return warning.cause == &cause::kForgeableKey; });
@@ -163,7 +163,7 @@ bool IsOneOf(const std::vector<std::string>& digests, const CertificateFacts& si
   });
 }
 
-// The kernel knows a signer by his key, and phones know him by his certificate.
+// The kernel knows a signer by the key, and phones know a signer by the certificate.
 bool AreSameSigner(const CertificateFacts& one, const CertificateFacts& other) {
   return one.sha256 == other.sha256 && one.key.modulus_sha256 == other.key.modulus_sha256;
 }

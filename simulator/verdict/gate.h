@@ -1,5 +1,5 @@
-// The demands of the command line on each file, beside the phone's answer: its signer, and that it
-// has no warnings.
+// The demands of the command line on each file, in addition to the phone's answer: the expected
+// signer (--signer), and no warnings (--werror).
 #pragma once
 
 #include <map>
@@ -12,14 +12,14 @@
 namespace simulator {
 
 struct GateOptions {
-  // The signers who are expected; none: anybody may sign. Each by the SHA-256 digest of his
-  // certificate, of its SubjectPublicKeyInfo or of its RSA modulus, as ReadDigest gives it.
+  // The expected signers; empty: any signer is allowed. Each is the SHA-256 digest of a
+  // certificate, of its SubjectPublicKeyInfo or of its RSA modulus, in the form of ReadDigest.
   std::vector<std::string> signers;
   bool refuses_warnings = false;
 };
 
-// A SHA-256 digest in lower-case hexadecimal, from the forms in which tools print it: in either
-// case, all digits in one or each two of them behind a colon. None for anything else.
+// Returns a SHA-256 digest in lower-case hexadecimal. Takes the forms in which tools print it: in
+// upper or lower case, with a colon after every two digits or without. None for anything else.
 std::optional<std::string> ReadDigest(const std::string& text);
 
 class Gate {
@@ -27,13 +27,13 @@ class Gate {
   // `options` must outlive this object.
   explicit Gate(const GateOptions& options) : options_(options) {}
 
-  // Adds an item to the report for each demand that its file does not meet; what was good until
-  // then is kNotAccepted. To be called once for each file, in the order of the command line: it is
+  // Adds an item to the report for each demand that the file does not meet. A good verdict becomes
+  // kNotAccepted. Called once per file, in the order of the command line, because each file is
   // compared with the first file of its package name.
   void Judge(Report* report);
 
  private:
-  // Who signed the first file of a package name.
+  // The signers of the first file of a package name.
   struct First {
     std::string file;
     CertificateFacts jar;

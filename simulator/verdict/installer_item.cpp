@@ -36,13 +36,13 @@ std::string LevelText(const LevelRange& levels) {
 }
 
 std::string TakersText(const Judgement& judgement) {
-  // Where all take it, one answer is for all of them.
+  // If all phones take it, there is one range.
   if (judgement.ranges.size() != 1 || !judgement.ranges[0].is_verified) return {};
   return "phones of " + LevelText(judgement.ranges[0].levels) + " take it, by " +
          Joined(judgement.ranges[0].schemes);
 }
 
-// Phones go by the newest scheme that they know, and by all of its signers.
+// Phones verify the newest scheme that they know, and all of its signers count.
 const CertificateFacts* OtherSigner(const Judgement& judgement, const Report& report) {
   const CertificateFacts* other = nullptr;
   for (const RangeJudgement& range : judgement.ranges) {

@@ -83,8 +83,7 @@ std::string Reason::Text() const {
   return at == std::string::npos ? text : text.replace(at, 2, detail);
 }
 
-// The verdict is the installer's where the tool signed, and the tool's or the simulation's
-// elsewhere.
+// If the installer caused the verdict, its item decides. Otherwise the first refused item decides.
 const Item* DecisiveItem(const Report& report) {
   const bool is_installers = report.verdict == Verdict::kNotInstallable ||
                              (report.verdict == Verdict::kNotSimulated && report.items.size() > 1);
@@ -121,12 +120,13 @@ Item OwnItem(const RunRecord& run, const PackageFacts& facts, const JudgeOptions
   }
   Item item = {kind, name, "", ItemState::kDone, {}};
   if (reason.cause != nullptr) item = NotDone(kind, name, reason, options);
-  // The kernel is asked for what was verified.
+  // The tool asks the kernel only for verified packages.
   item.is_verified = kind == ItemKind::kPackage && run.own.has_value();
   return item;
 }
 
-// As the tool saw it: what it could not open is neither package nor JAR, and a JAR gets no data.
+// The kind that the tool saw. A file that it could not open is neither a package nor a JAR. Only a
+// JAR is signed with an empty payload.
 ItemKind KindOf(const RunRecord& run) {
   constexpr char kNoData[] = "0000";
   if (run.is_jar || (run.own && run.own->payload == kNoData)) return ItemKind::kJar;

@@ -1,5 +1,5 @@
-// From what happened and what can be seen to the report of it: a pure function, which touches no
-// file.
+// Makes a report from the record of a run and the facts of the file. A pure function: it reads and
+// writes no files.
 #pragma once
 
 #include <cstdint>
@@ -11,18 +11,18 @@
 
 namespace simulator {
 
-// How the user wants it judged.
+// The user's choices for the judgement.
 struct JudgeOptions {
-  bool is_strict = false;  // what is absent or damaged counts as refused
+  bool is_strict = false;  // absent libraries and damaged entries count as refused
   // Certificates that ended before it have expired; in seconds since 1970 in UTC.
   int64_t now = 0;
 };
 
-// `installer`: what the phones' installer says of the file.
+// `installer`: the judgement of the phones' installer.
 Report MakeReport(const RunRecord& run, const PackageFacts& facts, const JudgeOptions& options,
                   const Judgement& installer = {});
 
-// An item that is not done. The severity of its cause says in which state it is.
+// Makes an item that is not kDone. The severity of its cause sets its state.
 Item NotDone(ItemKind kind, const std::string& name, const Reason& reason,
              const JudgeOptions& options);
 

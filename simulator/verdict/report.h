@@ -1,5 +1,5 @@
-// The result for one file: the one structure from which the text, the journal's last event and all
-// other forms are made. Plain data, computed once by MakeReport (make_report.h).
+// The result for one file. The text, the journal's last event and all other forms are made from
+// it alone. Plain data, computed once by MakeReport (make_report.h).
 #pragma once
 
 #include <cstdint>
@@ -17,11 +17,11 @@ namespace simulator {
 
 enum class Verdict {
   kSigned,
-  kOtherSigner,  // signed, and phones install it for another signer than the kernel knows it by
+  kOtherSigner,  // signed, but phones install it for another signer than the kernel's
   kTrustedJar,
   kPartlySigned,
-  kNotInstallable,  // something was signed, and phones do not install it
-  kNotAccepted,     // all was signed, and it is not what the command line demands
+  kNotInstallable,  // something was signed, but phones do not install the package
+  kNotAccepted,     // everything was signed, but the command line's gate refuses it
   kRefused,
   kNotTrustedJar,
   kNotLookedAt,
@@ -41,11 +41,14 @@ enum class ItemKind {
   kWarnings
 };
 
-// Signed or registered; should have been and was not; a library that does not lie beside the
-// package, which is refused where the user is strict; nothing to sign.
-enum class ItemState { kDone, kRefused, kAbsent, kNothing };
+enum class ItemState {
+  kDone,     // signed or registered
+  kRefused,  // should have been signed or registered, but was not
+  kAbsent,   // a library that is not beside the package; with --strict it is kRefused
+  kNothing   // nothing to sign
+};
 
-// A cause with what fills in its "%s".
+// A cause and the text for its "%s".
 struct Reason {
   const Cause* cause = nullptr;
   std::string detail;
@@ -53,40 +56,41 @@ struct Reason {
   std::string Text() const;
 };
 
-// One thing that was to be signed or registered, or somebody who refuses all of it.
+// One thing that had to be signed or registered, or a party that refuses the whole file.
 struct Item {
   ItemKind kind;
-  std::string name;   // of a library: below the package's directory; of a key: what it is for
-  std::string entry;  // of a library: in the package
+  std::string name;   // of a library: its path below the package's directory; of a key: the
+                      // package or JAR for which it is registered
+  std::string entry;  // of a library: its entry in the package
   ItemState state;
-  Reason reason;             // none for what is done
-  bool is_verified = false;  // its bytes were compared with the manifest, and are the same
+  Reason reason;             // a null cause if the state is kDone
+  bool is_verified = false;  // its bytes were compared with the manifest, and match
 };
 
-// The key that the JAR signature is made with, as kernel and tool know it.
+// The key of the JAR signature, as the kernel and the tool know it.
 struct KernelKey {
   std::string sha256;    // of its modulus; in hexadecimal
   int bits = 0;          // 0: not known
-  bool was_got = false;  // the kernel got this digest; else it is what the tool would hand to it
+  bool was_got = false;  // true if the kernel got this digest; else the tool would send it
 };
 
-// A part of the package, by what protects it.
+// The size of a part of the package.
 struct Share {
   uint64_t entries = 0;
   uint64_t bytes = 0;  // in the archive
 };
 
 struct Protection {
-  Share verified;   // as the manifest lists them, and the tool looked at them: dex and libraries
-  Share vouched;    // as the manifest lists them, and the tool did not look at them
-  Share unlisted;   // not in the manifest
+  Share verified;   // entries that match the manifest, checked by the tool: dex and libraries
+  Share vouched;    // entries that match the manifest, not checked by the tool
+  Share unlisted;   // entries without a digest in the manifest
   Share signature;  // the manifest, signature files and blocks
   std::vector<std::string> unlisted_names;
-  Share differing = {};         // other than the manifest lists them
-  Share uncompared = {};        // in the manifest, and not compared with it
-  uint64_t differing_seen = 0;  // of the differing entries, at how many the tool looked
+  Share differing = {};         // entries that do not match the manifest
+  Share uncompared = {};        // listed entries that were not compared with the manifest
+  uint64_t differing_seen = 0;  // the number of differing entries at which the tool looked
   std::vector<std::string> differing_names = {};
-  std::vector<std::string> missing_names = {};  // in the manifest, and not in the package
+  std::vector<std::string> missing_names = {};  // in the manifest, but not in the package
 };
 
 enum class LinkState { kHolds, kBroken, kNotReached };
@@ -95,7 +99,7 @@ enum class LinkState { kHolds, kBroken, kNotReached };
 struct Link {
   const char* name;
   LinkState state;
-  std::string text;  // what stands there; of a broken one, why it does not hold
+  std::string text;  // the key, name or entry of the link; if it is broken, the reason
 };
 
 struct Report {
@@ -107,11 +111,11 @@ struct Report {
   std::vector<Item> items;
   std::vector<Reason> warnings;
 
-  std::string payload;                     // that the kernel got, in hexadecimal; empty: none
+  std::string payload;                     // the payload of the kernel, in hexadecimal; empty: none
   std::optional<KernelKey> key;            // of a package with an RSA key
   std::optional<CertificateFacts> signer;  // of the JAR signature
-  std::vector<std::string> schemes;        // that the file carries: "v1", "v2", …
-  std::vector<NewerSignerFacts> newer;     // who signed with those after v1
+  std::vector<std::string> schemes;        // the file's schemes: "v1", "v2", …
+  std::vector<NewerSignerFacts> newer;     // the signers of the schemes after v1
   Judgement installer;
   Protection protection;
   uint64_t file_size = 0;
@@ -119,17 +123,17 @@ struct Report {
   ToolIdentity tool;
   std::vector<Link> chain;  // empty for a file that is not a package
 
-  Events events;  // all that happened, in order
+  Events events;  // all events, in order
 };
 
-// The item that the verdict comes from, such as the first that was refused; null if nothing was.
+// The refused item that decides the verdict, mostly the first one; null if nothing was refused.
 const Item* DecisiveItem(const Report& report);
 
-// A signer for whom the newest of the phones that take the package install it, and who is not the
-// JAR's; null if all are the JAR's. Of the report the signer and the key are filled.
+// A signer for whom the newest phones that take the package install it, if that signer is not the
+// JAR's; null if all are the JAR's. Reads only the signer and the key of the report.
 const CertificateFacts* OtherSigner(const Judgement& judgement, const Report& report);
 
-// The exit status that a verdict stands for.
+// The exit status for a verdict.
 ExitStatus StatusOf(Verdict verdict);
 
 }  // namespace simulator

@@ -1,4 +1,4 @@
-// Numbers, lists and keys as they stand in sentences.
+// The wording of numbers, lists and keys in sentences.
 #pragma once
 
 #include <cstdint>
@@ -30,12 +30,12 @@ inline std::string CountedNames(const std::vector<std::string>& names) {
 // Such as "API 27 and later".
 std::string LevelText(const LevelRange& levels);
 
-// Which phones take the package, and by which schemes they know its signer: "phones of API 27 and
-// later take it, by v2, v3". Empty unless all of those that were asked do.
+// Names the phones that take the package, and the schemes by which they know its signer: "phones of
+// API 27 and later take it, by v2, v3". Empty unless all phones that were asked about take it.
 std::string TakersText(const Judgement& judgement);
 
-// Such as "RSA-2048", of the JAR signer: as the tool reads the key, else as the certificate shows
-// it. Empty when nobody does.
+// The name of the JAR signer's key, such as "RSA-2048": by the tool's reading, else by the
+// certificate. Empty if neither of them has a key.
 inline std::string KeyName(const Report& report) {
   const PublicKey shown = report.signer ? report.signer->key : PublicKey();
   const std::string algorithm = report.key ? "RSA" : shown.algorithm;
