@@ -68,9 +68,9 @@ inline constexpr Cause kReadOnlyFileSystem = {"read-only-file-system", Group::kN
     "Nothing to do for a file of the system image. Copy any other file to a file system that can "
     "be written."};
 inline constexpr Cause kStandardInputClosed = {"standard-input-closed", Group::kNotLookedAt,
-    Severity::kUnseen, ChainLink::kKey, "", "standard input is closed, so the file got its place, "
-    "descriptor 0, which the tool takes for a failure",
-    "Start the tool with a standard input, be it /dev/null."};
+    Severity::kUnseen, ChainLink::kKey, "", "standard input is closed, so the file got descriptor 0, "
+    "which the tool takes for a failure",
+    "Start the tool with a standard input, for example /dev/null."};
 inline constexpr Cause kFileLeased = {"file-leased", Group::kNotLookedAt, Severity::kUnseen,
     ChainLink::kKey, "", "another process holds a lease on it",
     "Have that process close the file, and run again; /proc/locks names it by its number."};
@@ -84,13 +84,13 @@ inline constexpr Cause kToolNotStarted = {"tool-not-started", Group::kSimulation
     ChainLink::kKey, "", "%s", "Check --tool and --runner."};
 inline constexpr Cause kToolTimedOut = {"tool-timed-out", Group::kSimulation, Severity::kFailed,
     ChainLink::kKey, "", "it was still busy after %s and was stopped", "The tool waits for ever "
-    "while its integrity value reads ffffffff, and for a while for who holds a lease on the file. "
-    "A large file may need a larger --timeout."};
+    "while its integrity value reads ffffffff. It waits for a while if another process holds a "
+    "lease on the file. A large file may need a larger --timeout."};
 inline constexpr Cause kStandInsMissing = {"stand-ins-missing", Group::kSimulation,
     Severity::kFailed, ChainLink::kKey, "", "the stand-ins were not loaded into %s",
     "Check --tool: it has to be a dynamically linked program for this processor or for --runner."};
 inline constexpr Cause kToolSilent = {"tool-silent", Group::kSimulation, Severity::kFailed,
-    ChainLink::kKey, "", "the tool neither said nor did anything, though the file can be opened",
+    ChainLink::kKey, "", "the tool logged nothing and did nothing, though the file can be opened",
     "Check --tool: it has to be apktoolkit."};
 inline constexpr Cause kStateNotKept = {"state-not-kept", Group::kSimulation, Severity::kFailed,
     ChainLink::kKey, "", "the signed files cannot be remembered in %s",
@@ -118,7 +118,7 @@ inline constexpr Cause kEmptyFile = {"empty-file", Group::kFile, Severity::kRefu
     "Build, copy or download it again."};
 inline constexpr Cause kTextFile = {"text-file", Group::kFile, Severity::kRefused, ChainLink::kKey,
     "`OpenArchiveFd(`", "it is a text and not an archive",
-    "Look into it: a failed download leaves its message so."};
+    "It may be the error message of a failed download: read it."};
 inline constexpr Cause kCutArchive = {"cut-archive", Group::kFile, Severity::kRefused,
     ChainLink::kKey, "`OpenArchiveFd(`", "it begins like an archive and has no end: it was cut off",
     "Copy or download it again, and compare the sizes."};
@@ -132,7 +132,7 @@ inline constexpr Cause kDamagedArchive = {"damaged-archive", Group::kFile, Sever
     "Copy or download it again. unzip -t, and the ziparchive lines of the log, name the fault."};
 inline constexpr Cause kEntryTwice = {"entry-twice", Group::kFile, Severity::kRefused,
     ChainLink::kEntries, "`OpenArchiveFd(`",
-    "%s stands in it more than once, and the zip library does not open that",
+    "%s is in it more than once, and the zip library does not open that",
     "Build the package again, with one entry of each name. If it is not of your making: do not "
     "trust it."};
 inline constexpr Cause kAppBundle = {"app-bundle", Group::kFile, Severity::kRefused,
@@ -141,7 +141,7 @@ inline constexpr Cause kAppBundle = {"app-bundle", Group::kFile, Severity::kRefu
     "Make packages of it with bundletool build-apks, and name those."};
 inline constexpr Cause kPackageSet = {"package-set", Group::kFile, Severity::kRefused,
     ChainLink::kKey, "`VELT can't verify a file`",
-    "it is an archive of packages (.apks, .xapk), and no package itself",
+    "it is an archive of packages (.apks, .xapk), and not a package",
     "Unpack it, and name the packages in it, the base and its splits."};
 inline constexpr Cause kPackageWithoutManifest = {"package-without-manifest", Group::kFile,
     Severity::kRefused, ChainLink::kKey, "`VELT can't verify a file`", "it has parts of a package "
@@ -209,14 +209,14 @@ inline constexpr Cause kKeyTooLarge = {"key-too-large", Group::kSignature, Sever
     "signature stays the first key's."};
 inline constexpr Cause kKeyTooSmall = {"key-too-small", Group::kSignature, Severity::kRefused,
     ChainLink::kKey, "`RSA could not verify certificate`",
-    "its RSA key has %s bits, and this tool takes no fewer than 128",
+    "its RSA key has %s bits, and this tool takes at least 128",
     "Sign it with an RSA key of 2048 to 4096 bits. That is another "
     "signer: phones refuse it as an update of a published app. Rotation does not help: the JAR "
     "signature stays the first key's."};
 inline constexpr Cause kExponentRefused = {"exponent-refused", Group::kSignature,
     Severity::kRefused, ChainLink::kKey, "`RSA could not set key`",
     "its RSA key has the public exponent %s, with which anyone can make its signatures",
-    "Do not trust this package. A key of one's own has the exponent 65537."};
+    "Do not trust this package. Normal keys have the exponent 65537."};
 inline constexpr Cause kCertificateIssued = {"certificate-issued", Group::kSignature,
     Severity::kRefused, ChainLink::kCertificate, "`RSA could not verify certificate`",
     "its certificate was issued by another (%s), and this tool takes self-signed ones alone",
@@ -285,15 +285,15 @@ inline constexpr Cause kKernelRefused = {"kernel-refused", Group::kKernel, Sever
     "The file was good. docs/guide.md, \"When the kernel refuses\", says where to look."};
 inline constexpr Cause kIntegrityZero = {"integrity-zero", Group::kKernel, Severity::kRefused,
     ChainLink::kNone, "`VELT can't sign a`",
-    "the tool's own integrity value settled at 0, so that it may not sign", "The file was good. "
-    "Look at the domain that the tool is started from: its value is to be neither 0 nor ffffffff."};
+    "the tool's own integrity value settled at 0, so the tool may not sign", "The file was good. "
+    "Look at the domain that the tool is started from: its value must be neither 0 nor ffffffff."};
 inline constexpr Cause kIntegrityMissing = {"integrity-missing", Group::kKernel, Severity::kRefused,
     ChainLink::kNone, "`VELT can't sign a`",
     "the tool has no integrity value: /proc/self/integrity/value is not there",
     "The file was good. The kernel lacks the feature, or /proc is not mounted."};
 inline constexpr Cause kIntegrityUnreadable = {"integrity-unreadable", Group::kKernel,
     Severity::kRefused, ChainLink::kNone, "`VELT can't sign a`",
-    "the tool's own integrity value reads \"%s\", which is no number",
+    "the tool's own integrity value reads \"%s\", which is not a number",
     "The file was good. Look at what /proc/self/integrity/value holds on that kernel."};
 
 // ---- A library.
@@ -365,7 +365,7 @@ inline constexpr Cause kLibraryBehindDamage = {"library-behind-damage", Group::k
 // ---- The key.
 inline constexpr Cause kRegistrationRefused = {"registration-refused", Group::kKey,
     Severity::kRefused, ChainLink::kNone, "`ZuNewCertificate failed`", "libzu answered %s",
-    "The code is the library's own. Files that were signed stay signed."};
+    "libzu defines the code. Files that were signed stay signed."};
 inline constexpr Cause kRegistrationNoPath = {"registration-no-path", Group::kKey,
     Severity::kRefused, ChainLink::kNone, "`Can't get jar location`",
     "its path cannot be read", "Check that /proc is mounted and can be read."};
@@ -386,8 +386,8 @@ inline constexpr Cause kNotInstallable = {"not-installable", Group::kInstaller, 
     "trust it. apksigner verify --min-sdk-version 27 names every fault."};
 inline constexpr Cause kNotInstallableOnSome = {"not-installable-on-some", Group::kInstaller,
     Severity::kRefused, ChainLink::kNone, "", "phones of %s",
-    "Sign it so that all of these phones take it, as apksigner does by itself. If it is for some "
-    "of them alone: --api names those."};
+    "Sign it so that all of these phones take it, as apksigner does by default. If it is only for "
+    "some of them, name those with --api."};
 inline constexpr Cause kInstallerGaveUp = {"installer-gave-up", Group::kInstaller,
     Severity::kRefused, ChainLink::kNone, "", "the installer's verifier gave up: %s", "Do not "
     "trust this package, if it is not of your making. A large one may need a larger --timeout; "
@@ -395,7 +395,7 @@ inline constexpr Cause kInstallerGaveUp = {"installer-gave-up", Group::kInstalle
 
 // ---- The gate: what the command line demands.
 inline constexpr Cause kSignerUnexpected = {"signer-unexpected", Group::kGate, Severity::kRefused,
-    ChainLink::kNone, "", "its signer is none that --signer names: %s",
+    ChainLink::kNone, "", "its signer is not one that --signer names: %s",
     "Sign it with the key that --signer names; a rotated key has to be named as well. If it is not "
     "of your making: do not trust it."};
 inline constexpr Cause kSignerNone = {"signer-none", Group::kGate, Severity::kRefused,
@@ -406,8 +406,8 @@ inline constexpr Cause kSignerNotVerified = {"signer-not-verified", Group::kGate
     "signature (%s)", "First fix the reason why the file is refused."};
 inline constexpr Cause kSignerDiffers = {"signer-differs", Group::kGate, Severity::kRefused,
     ChainLink::kNone, "", "the files of a package must have one signer: %s",
-    "Sign all files of the package with one key and certificate. Look at other builds of it in "
-    "runs of their own."};
+    "Sign all files of the package with one key and certificate. Look at its other builds in "
+    "separate runs."};
 
 inline constexpr Cause kWarningsRefused = {"warnings-refused", Group::kGate, Severity::kRefused,
     ChainLink::kNone, "", "a warning counts as a refusal (--werror): %s",
@@ -430,9 +430,9 @@ inline constexpr Cause kSeveralSigners = {"several-signers", Group::kWarning, Se
     "Sign it with one key."};
 inline constexpr Cause kForgeableKey = {"forgeable-key", Group::kWarning, Severity::kWarning,
     ChainLink::kNone, "", "the key has the public exponent %s: anyone can make its signatures",
-    "Do not trust this package. A key of one's own has the exponent 65537."};
+    "Do not trust this package. Normal keys have the exponent 65537."};
 inline constexpr Cause kEntriesChanged = {"entries-changed", Group::kWarning, Severity::kWarning,
-    ChainLink::kNone, "", "%s: other than the manifest lists, and the tool does not look there",
+    ChainLink::kNone, "", "%s: not as the manifest lists, and the tool does not look there",
     "Sign the package again, as the last step that changes it. If it is not of your making: do not "
     "trust it."};
 inline constexpr Cause kEntriesMissing = {"entries-missing", Group::kWarning, Severity::kWarning,
@@ -444,19 +444,19 @@ inline constexpr Cause kEntriesNotCompared = {"entries-not-compared", Group::kWa
     "long, of another digest than SHA-1 and SHA-256, or the time was up",
     "unzip -t names an unreadable entry. Run it again with a larger --timeout. Entries above 512 MiB are not compared."};
 inline constexpr Cause kWeakKey = {"weak-key", Group::kWarning, Severity::kWarning,
-    ChainLink::kNone, "", "its RSA key has %s bits, and 2048 are the least that is safe",
+    ChainLink::kNone, "", "its RSA key has %s bits; fewer than 2048 bits are not safe",
     "Sign a new app with a key of 2048 bits or more. For a published one that is another signer."};
 inline constexpr Cause kDebugKey = {"debug-key", Group::kWarning, Severity::kWarning,
-    ChainLink::kNone, "", "it is signed with a debug certificate (CN=Android Debug), of which each "
-    "workstation makes its own", "Sign a release with a key of its own."};
+    ChainLink::kNone, "", "it is signed with a debug certificate (CN=Android Debug); each "
+    "workstation makes another one", "Sign a release with a release key."};
 inline constexpr Cause kWeakDigest = {"weak-digest", Group::kWarning, Severity::kWarning,
     ChainLink::kNone, "", "SHA-1 or MD5 is in use: %s",
     "Sign it again with SHA-256: apksigner does so with --min-sdk-version 18. Certify the key of a "
     "new app with SHA-256 as well; for a published one that makes another signer."};
 inline constexpr Cause kCertificateExpired = {"certificate-expired", Group::kWarning,
     Severity::kWarning, ChainLink::kNone, "", "its certificate expired on %s",
-    "Phones install it all the same, and a new certificate makes another signer of a published "
-    "app. Make the one of a new app to last: keytool -validity 10000."};
+    "Phones still install it. A published app must keep its certificate: a new one makes another "
+    "signer. For a new app make one that lasts: keytool -validity 10000."};
 inline constexpr Cause kUnlistedEntries = {"unlisted-entries", Group::kWarning, Severity::kWarning,
     ChainLink::kNone, "", "the signature does not protect %s: no digest in the manifest",
     "Sign the package again, as the last step that changes it; --verbose lists them."};
@@ -466,13 +466,13 @@ inline constexpr Cause kNotLaidOut = {"not-laid-out", Group::kWarning, Severity:
 inline constexpr Cause kCertificateOtherKey = {"certificate-other-key", Group::kWarning,
     Severity::kAlarm, ChainLink::kNone, "",
     "its certificate shows another key than the tool reads: %s", "Do not trust this package, if it "
-    "is not of your making: others take its key for another one."};
+    "is not of your making: other programs see another key in it."};
 inline constexpr Cause kBlockAmbiguous = {"block-ambiguous", Group::kWarning, Severity::kAlarm,
     ChainLink::kNone, "",
     "others may read another signer in its signature block than the tool does: %s",
     "Sign the package again with apksigner. If it is not of your making: do not trust it."};
 inline constexpr Cause kOtherPackageName = {"other-package-name", Group::kWarning, Severity::kAlarm,
-    ChainLink::kNone, "", "phones install it as %s, and the tool reads that other package name",
+    ChainLink::kNone, "", "phones install it as %s, but the tool reads another package name",
     "Build the package again with aapt or aapt2. If it is not of your making: do not trust it."};
 inline constexpr Cause kFileChanged = {"file-changed", Group::kWarning, Severity::kAlarm,
     ChainLink::kNone, "",

@@ -88,7 +88,7 @@ constexpr struct {
     {"JAR_SIG_NO_ZIP_ENTRY_DIGEST_IN_MANIFEST", 0,
      "%s was added after signing: the manifest does not list it"},
     {"JAR_SIG_ZIP_ENTRY_NOT_SIGNED", 0, "%s is not signed"},
-    {"JAR_SIG_DUPLICATE_ZIP_ENTRY", 0, "%s stands in it more than once"},
+    {"JAR_SIG_DUPLICATE_ZIP_ENTRY", 0, "%s is in it more than once"},
     {"JAR_SIG_MISSING_APK_SIG_REFERENCED", 2,
      "it was signed with %s as well, and that signature is gone"},
     {"MIN_SIG_SCHEME_FOR_TARGET_SDK_NOT_MET", 0,

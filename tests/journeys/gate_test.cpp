@@ -111,11 +111,11 @@ TEST(Signer, WhoWasNotExpectedStandsInFirstLineItemAndJournal) {
   const Lines words = {"--installer=off", "--signer", expected, Apk("apksigner-sha256-2048")};
   const std::string text = Simulated(words).output;
   const std::string first = text.substr(0, text.find('\n'));
-  EXPECT_NE(first.find("its signer is none that --signer names: expected " + expected),
+  EXPECT_NE(first.find("its signer is not one that --signer names: expected " + expected),
             std::string::npos)
       << first;
   EXPECT_NE(first.find("of the modulus " + actual), std::string::npos) << first;
-  EXPECT_NE(text.find("\n  ✗ signer                 its signer is none that"), std::string::npos)
+  EXPECT_NE(text.find("\n  ✗ signer                 its signer is not one that"), std::string::npos)
       << text;
   const json item = Events(words).at(0)["items"].back();
   EXPECT_EQ(item["kind"], "signer");

@@ -214,7 +214,7 @@ TEST_F(Reason, ExponentOfOne) {
   EXPECT_EQ(told[1],
             "  ✗ package                not signed: its RSA key has the public exponent 1, with "
             "which anyone can make its signatures");
-  EXPECT_EQ(told[2], "      Do not trust this package. A key of one's own has the exponent 65537.");
+  EXPECT_EQ(told[2], "      Do not trust this package. Normal keys have the exponent 65537.");
   EXPECT_EQ(refusal({0xff, 0xff, 0xff, 0xff})[1],
             "  ✗ package                not signed: its RSA key has the public exponent -1, "
             "with which anyone can make its signatures");
@@ -265,13 +265,13 @@ TEST_F(Reason, IntegrityValueZero) {
       Told(8, {"--integrity", "0"}),
       Lines({"REFUSED  base.apk",
              "  ✗ package                not signed: the tool's own integrity value settled "
-             "at 0, so that it may not sign",
+             "at 0, so the tool may not sign",
              "  ✗ lib/arm64/libvault.so  not signed: the tool's own integrity value settled "
-             "at 0, so that it may not sign",
+             "at 0, so the tool may not sign",
              "  ✗ lib/arm/libvault.so    not signed: the tool's own integrity value settled "
-             "at 0, so that it may not sign",
+             "at 0, so the tool may not sign",
              "      The file was good. Look at the domain that the tool is started from: its",
-             "      value is to be neither 0 nor ffffffff.",
+             "      value must be neither 0 nor ffffffff.",
              "  ✓ key                    registered for com.example.vault", "  signer", "-> 1"}));
 }
 
@@ -313,7 +313,7 @@ TEST_F(Reason, ClosedStandardInput) {
   Take("apksigner-sha256-2048");
   EXPECT_EQ(Told(2, {}, "base.apk", {"bash", "-c", "exec \"$0\" \"$@\" <&-"}),
             Lines({"NOT LOOKED AT  base.apk",
-                   "  ✗ file  not looked at: standard input is closed, so the file got its place, "
+                   "  ✗ file  not looked at: standard input is closed, so the file got "
                    "descriptor 0, which the tool takes for a failure",
                    "-> 4"}));
 }
@@ -381,7 +381,7 @@ TEST_F(Reason, EntryThatStandsTwice) {
   Do("python3 -W ignore -c \"import zipfile; zipfile.ZipFile('base.apk', 'a').writestr("
      "'classes.dex', 'x')\"");
   EXPECT_EQ(Told(2)[1],
-            "  ✗ file  not signed: classes.dex stands in it more than once, and the zip library "
+            "  ✗ file  not signed: classes.dex is in it more than once, and the zip library "
             "does not open that");
 }
 
@@ -407,13 +407,13 @@ TEST_F(Reason, ArchivesThatAreNoPackage) {
   EXPECT_EQ(
       Told(3, {}, "set.apks"),
       Lines({"REFUSED  set.apks",
-             "  ✗ JAR  not signed: it is an archive of packages (.apks, .xapk), and no "
-             "package itself",
+             "  ✗ JAR  not signed: it is an archive of packages (.apks, .xapk), and not "
+             "a package",
              "      Unpack it, and name the packages in it, the base and its splits.", "-> 1"}));
   EXPECT_EQ(Told(2, {}, "set.xapk"),
             Lines({"REFUSED  set.xapk",
-                   "  ✗ JAR  not signed: it is an archive of packages (.apks, .xapk), and no "
-                   "package itself",
+                   "  ✗ JAR  not signed: it is an archive of packages (.apks, .xapk), and not "
+                   "a package",
                    "-> 1"}));
   EXPECT_EQ(Told(2)[1].substr(0, 50), "  ✗ JAR  not signed: it has parts of a package (");
 }
@@ -435,7 +435,7 @@ TEST_F(Reason, KeyOf512BitsIsSignedWithAWarning) {
             0U);
   EXPECT_EQ(told[0].substr(told[0].size() - 12), "   1 warning");
   EXPECT_NE(std::find(told.begin(), told.end(),
-                      "  ! its RSA key has 512 bits, and 2048 are the least that is safe"),
+                      "  ! its RSA key has 512 bits; fewer than 2048 bits are not safe"),
             told.end());
 }
 

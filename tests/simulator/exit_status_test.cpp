@@ -103,7 +103,7 @@ TEST(ExitStatus, ThreeWhenTheToolIsAnotherProgramThatDoesNothing) {
   const ProcessResult result = Simulated({probe.path()});
   EXPECT_EQ(result.status, 3);
   EXPECT_EQ(result.errors, "apktoolkit-sim: " + probe.path() +
-                               ": the tool neither said nor did anything, though the file can be "
+                               ": the tool logged nothing and did nothing, though the file can be "
                                "opened\n");
   const Probe failing({"exit 1"});
   const ProcessResult failed = Simulated({failing.path()});

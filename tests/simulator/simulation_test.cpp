@@ -437,7 +437,7 @@ TEST(Tool, RunsAsItIsOnAFileThatIsNoZip) {
   EXPECT_EQ(result.output, "REFUSED  " + file +
                                "   it is a text and not an archive\n"
                                "  ✗ file  not signed: it is a text and not an archive\n"
-                               "      Look into it: a failed download leaves its message so.\n"
+                               "      It may be the error message of a failed download: read it.\n"
                                "   1  error      OpenArchiveFd(3) [file: " +
                                file +
                                "] returned: -3: Invalid file\n"

@@ -75,8 +75,8 @@ TEST(Junit, HasACaseForEachFileAndCountsThem) {
           "error [('message', 'NOT SIMULATED: why'), ('type', 'tool-not-started')] "
           "'package: not signed: why\\n    Check --tool and --runner.'\n"
           "testcase [('classname', 'apktoolkit-sim'), ('name', 'd.apk')] ''\n"
-          "system-out [] 'warning: its RSA key has 1024 bits, and 2048 are the least that is "
-          "safe\\n    Sign a new app with a key of 2048 bits or more. For a published one that "
+          "system-out [] 'warning: its RSA key has 1024 bits; fewer than 2048 bits are not safe\\n"
+          "    Sign a new app with a key of 2048 bits or more. For a published one that "
           "is another signer.'\n");
 }
 

@@ -81,8 +81,8 @@ TEST(PageTable, SaysWhyAndWhose) {
   EXPECT_EQ(RowsOf({refused, good}),
             (Lines{"PARTLY SIGNED|a|lib/arm/a.so: it does not lie beside the package, where others "
                    "are|1|com.app||",
-                   "SIGNED|b|! phones install it as &quot;com.evil&quot;, and the tool reads that "
-                   "other package name|1|com.good|CN=Vault, RSA-2048, key bbbbbbbb…bbbbbb|"}));
+                   "SIGNED|b|! phones install it as &quot;com.evil&quot;, but the tool reads "
+                   "another package name|1|com.good|CN=Vault, RSA-2048, key bbbbbbbb…bbbbbb|"}));
 }
 
 TEST(PageTable, SaysForWhomElsePhonesInstallIt) {

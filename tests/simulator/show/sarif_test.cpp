@@ -70,7 +70,7 @@ TEST(Sarif, HasTheWholeRun) {
          "help": {"text": "The file was good. docs/guide.md, \"When the kernel refuses\", says where to look."},
          "defaultConfiguration": {"level": "error"}},
         {"id": "weak-key",
-         "shortDescription": {"text": "its RSA key has … bits, and 2048 are the least that is safe"},
+         "shortDescription": {"text": "its RSA key has … bits; fewer than 2048 bits are not safe"},
          "help": {"text": "Sign a new app with a key of 2048 bits or more. For a published one that is another signer."},
          "defaultConfiguration": {"level": "warning"}}]}},
       "invocations": [{"executionSuccessful": true}],
@@ -84,7 +84,7 @@ TEST(Sarif, HasTheWholeRun) {
          "message": {"text": "lib/arm64/a.so: not signed: the kernel refused (EPERM)"},
          "locations": [{"physicalLocation": {"artifactLocation": {"uri": "b.apk", "index": 1}}}]},
         {"ruleId": "weak-key", "ruleIndex": 1, "level": "warning",
-         "message": {"text": "its RSA key has 512 bits, and 2048 are the least that is safe"},
+         "message": {"text": "its RSA key has 512 bits; fewer than 2048 bits are not safe"},
          "locations": [{"physicalLocation": {"artifactLocation": {"uri": "b.apk", "index": 1}}}]}]
     }]})json"));
 }

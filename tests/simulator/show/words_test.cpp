@@ -134,10 +134,10 @@ TEST(HeadFacts, HaveASignerWhoWasNotExpectedBesideAnyReason) {
   report.items[0].state = ItemState::kRefused;
   EXPECT_EQ(HeadFacts(report, "..."),
             Lines({"lib/arm64/a.so: it does not lie beside the package, where others are",
-                   "its signer is none that --signer names: who"}));
+                   "its signer is not one that --signer names: who"}));
   report.verdict = Verdict::kNotAccepted;
   report.items = {signer};
-  EXPECT_EQ(HeadFacts(report, "..."), Lines({"its signer is none that --signer names: who"}));
+  EXPECT_EQ(HeadFacts(report, "..."), Lines({"its signer is not one that --signer names: who"}));
   // That the signer of a refused file is not known follows from the refusal.
   report.verdict = Verdict::kRefused;
   report.items = {Library(&cause::kLibraryMissing), signer};

@@ -121,7 +121,7 @@ TEST(Gate, SaysWhoIsExpectedAndWhoSigned) {
   Gate(options).Judge(&report);
   EXPECT_EQ(report.items[1].kind, ItemKind::kSigner);
   EXPECT_EQ(report.items[1].reason.Text(),
-            "its signer is none that --signer names: expected " + kOwner.sha256 + " or " +
+            "its signer is not one that --signer names: expected " + kOwner.sha256 + " or " +
                 kThird.key.sha256 +
                 ", and the JAR signature is by CN=b (SHA-256 digest of the "
                 "certificate " +
@@ -266,8 +266,8 @@ TEST(GateOfWarnings, SaysTheFirstAndHowManyMore) {
   Gate(options).Judge(&report);
   EXPECT_EQ(report.items[1].kind, ItemKind::kWarnings);
   EXPECT_EQ(report.items[1].reason.Text(),
-            "a warning counts as a refusal (--werror): its RSA key has 1024 bits, and 2048 are the "
-            "least that is safe (and 2 more)");
+            "a warning counts as a refusal (--werror): its RSA key has 1024 bits; fewer than 2048 "
+            "bits are not safe (and 2 more)");
 }
 
 TEST(GateOfWarnings, AnotherSignerOfTheNewestSchemeCountsAsOne) {

@@ -83,7 +83,7 @@ TEST(InstallerItem, NamesTheEntry) {
   EXPECT_EQ(Why({"JAR_SIG_NO_ZIP_ENTRY_DIGEST_IN_MANIFEST", {"a/b"}, ""}),
             start + "a/b was added after signing: the manifest does not list it");
   EXPECT_EQ(Why({"JAR_SIG_DUPLICATE_ZIP_ENTRY", {"a/b"}, ""}),
-            start + "a/b stands in it more than once");
+            start + "a/b is in it more than once");
   // An answer without the parameter still has a sentence.
   EXPECT_EQ(Why({"JAR_SIG_DUPLICATE_ZIP_ENTRY", {}, "twice"}),
             start + "twice (JAR_SIG_DUPLICATE_ZIP_ENTRY)");
