@@ -38,7 +38,7 @@ class ManifestMf {
  private:
   bool parse();
 
-  std::vector<uint8_t> text_;  // its continuation lines moved up behind what they continue
+  std::vector<uint8_t> text_;  // with continuation lines joined to the lines that they continue
   Sections sections_;          // of the text
   bool valid_ = false;
 };

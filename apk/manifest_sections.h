@@ -81,11 +81,11 @@ class ManifestSections {
   ElementIterator<ManifestSections> begin() const { return {this, 0}; }
   ElementIterator<ManifestSections> end() const { return {this, size()}; }
 
-  // The parser fills the table by the three functions below. reset forgets everything; attributes
-  // that are added later are pieces of the `size` bytes at `text`.
+  // The parser fills the table with the three functions below. reset removes all sections. The
+  // attributes that are added after it are pieces of the `size` bytes at `text`.
   void reset(const uint8_t* text, size_t size);
-  // Adds an attribute, neither of whose pieces is empty, to the open section. Repeated names take
-  // no memory.
+  // Adds an attribute to the open section. Its name and its value are not empty. Repeated names
+  // take no memory.
   void add(const ManifestAttribute& attribute);
   // Ends the open section, which may be empty. Only ended sections are visible.
   void endSection();
@@ -99,5 +99,5 @@ class ManifestSections {
   const char* text_ = nullptr;
   std::vector<ManifestAttribute> attributes_;
   std::vector<uint32_t> ends_;     // of each section in attributes_
-  size_t patience_ = kLittleText;  // where in the text the section at hand is put in order next
+  size_t patience_ = kLittleText;  // the offset in the text at which the open section is sorted
 };

@@ -1,8 +1,8 @@
 // bench_packages DIRECTORY: makes the packages that the benchmarks measure. Each is
 // DIRECTORY/<name>/base.apk with its libraries extracted beside it, as an installer leaves them.
 //
-// The contents come from the machine: its own libraries and the files of /usr/share. Zeros and
-// noise would cost an inflate other times than a real package does.
+// The contents come from the machine: its own libraries and the files of /usr/share. Zeros or
+// random bytes would not take the same time to inflate as a real package.
 #include <algorithm>
 #include <cstdio>
 #include <filesystem>

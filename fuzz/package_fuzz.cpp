@@ -140,7 +140,7 @@ class Judge {
  private:
   void JudgeSigning(int fd, const std::string& payload, bool is_package_file) {
     if (payload == "0000") {
-      Require(!model_->is_package(), "the empty payload is for what is no package");
+      Require(!model_->is_package(), "the empty payload is for files that are not packages");
       Require(is_package_file && phone_.verify_errno == 0, "and only for a file trusted already");
       return;
     }

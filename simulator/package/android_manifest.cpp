@@ -25,21 +25,21 @@ std::string Text(const char16_t* text, size_t length);
 AndroidManifest ParseAndroidManifest(const std::vector<uint8_t>& bytes) {
   AndroidManifest manifest;
   android::ResXMLTree document;
-  // The parser reads the document's header without asking whether there is room for one.
+  // The parser reads the document's header without checking that the bytes are long enough.
   const bool has_header = bytes.size() >= sizeof(android::ResXMLTree_header);
   if (!has_header || document.setTo(bytes.data(), bytes.size(), false) != 0) return manifest;
   manifest.has_overlaps = HasOverlaps(document.getStrings(), bytes.size());
   if (manifest.has_overlaps) return manifest;
   ReadAsInstaller(&document, &manifest);
-  ApkTools::Apk tool(-1);  // without a file; it is asked for this alone
+  ApkTools::Apk tool(-1);  // without a file; only its parser is used
   if (tool.ParseAndroidManifest(bytes)) manifest.package_name = tool.GetPackageName();
   return manifest;
 }
 
 namespace {
 
-// The parser keeps a copy of each UTF-8 string that it is asked for. Strings that lie in one
-// another can be many times as long, all together, as the document.
+// The parser keeps a copy of each UTF-8 string that it is asked for. Overlapping strings together
+// can be many times as long as the document.
 bool HasOverlaps(const android::ResStringPool& strings, size_t document_size) {
   uint64_t length = 0;
   for (size_t i = 0; strings.isUTF8() && i < strings.size(); ++i) {
@@ -69,7 +69,7 @@ void ReadAsInstaller(ResXMLParser* parser, AndroidManifest* manifest) {
   }
 }
 
-// In any namespace, as installers take it.
+// Takes the attribute in any namespace, as installers do.
 std::optional<bool> ExtractsLibraries(const ResXMLParser& application) {
   std::optional<bool> extracts;
   for (size_t i = 0; i < application.getAttributeCount(); ++i) {
@@ -83,7 +83,7 @@ std::optional<bool> ExtractsLibraries(const ResXMLParser& application) {
   return extracts;
 }
 
-// By the length first: a long name may be there many times.
+// Compares the lengths first, because a long name may occur many times.
 bool Is(const char16_t* text, const size_t* length, std::string_view expected) {
   return *length == expected.size() && Text(text, *length) == expected;
 }

@@ -10,15 +10,15 @@
 namespace simulator {
 
 struct AndroidManifest {
-  // The strings of the document lie in one another, so that the platform's parser would take a
-  // multiple of its size in memory; it is not read.
+  // The strings of the document overlap. The platform's parser would use many times the size of
+  // the document, so the document is not read.
   bool has_overlaps = false;
-  // The package's name by the tool's own reader; none when that does not read the document.
+  // The package's name by the tool's own reader; none if it cannot read the document.
   std::optional<std::string> package_name;
-  // The same as the installer reads it: the attribute "package" of no namespace, of the root.
-  // UTF-8, up to the first NUL.
+  // The package's name by the installer's rules: the root's attribute "package" without a
+  // namespace. UTF-8, up to the first NUL.
   std::string installer_name;
-  // The attribute extractNativeLibs of the first application; none when it is not there.
+  // The attribute extractNativeLibs of the first application; none if it has no such attribute.
   std::optional<bool> extracts_libraries;
 };
 

@@ -16,8 +16,8 @@ enum class EntryDigest {
   kUnlisted,  // the manifest has none
   kMatches,
   kDiffers,
-  kNotCompared,  // the entry cannot be read or is too long, its digest is of no kind that the tool
-                 // reads, or the time was up
+  kNotCompared,  // the entry cannot be read or is too long, the tool does not know the kind of its
+                 // digest, or the time was up
 };
 
 struct ListedEntry {
@@ -25,22 +25,22 @@ struct ListedEntry {
   bool is_listed;     // the manifest has a digest for it
   bool is_signature;  // it belongs to a JAR signature itself
   EntryDigest digest = EntryDigest::kUnlisted;
-  bool has_sha1 = false;  // the digest by which the tool would know it is a SHA-1 digest
+  bool has_sha1 = false;  // the digest that the tool would compare is a SHA-1 digest
 };
 
 struct PackageEntries {
   std::vector<ListedEntry> all;      // in the order of the archive
-  std::vector<std::string> missing;  // names that the manifest lists and the archive does not have
+  std::vector<std::string> missing;  // names in the manifest that the archive does not have
 };
 
-// True when no more time is to be spent.
+// True if the time is up.
 using IsLate = std::function<bool()>;
 
 // `manifest`: the text of META-INF/MANIFEST.MF; may be empty.
 PackageEntries CompareEntries(Archive* archive, std::vector<uint8_t> manifest,
                               const IsLate& is_late);
 
-// Whether the tool takes a digest of this name, such as "SHA1-Digest", for one of SHA-1.
+// True if the tool reads a digest with this name, such as "SHA1-Digest", as SHA-1.
 bool IsSha1Digest(const std::string& name);
 
 }  // namespace simulator

@@ -1,16 +1,16 @@
 // The platform's log library, as the simulator stands in for it.
 //
-// Two generations of it are in use: up to API level 29 a writer hands a record over as an
-// `__android_logger_data` with the text beside it, later as an `__android_log_message` with the
-// text inside. Only this file sees the difference. Texts and records belong to the caller, and are
-// read during the call alone.
+// Two generations of it are in use. Up to API level 29 a record is an `__android_logger_data`, and
+// the text is passed beside it. Later it is an `__android_log_message` with the text inside. Only
+// this file sees the difference. Texts and records belong to the caller, and are read only during
+// the call.
 #pragma once
 
 #include <android/log.h>
 
 #include <type_traits>
 
-// Each is defined by one of the generations alone.
+// Each generation of the library defines one of these.
 struct __android_logger_data;
 struct __android_log_message;
 
@@ -21,8 +21,8 @@ inline constexpr bool kLogLibraryHas = false;
 template <typename Record>
 inline constexpr bool kLogLibraryHas<Record, std::void_t<decltype(sizeof(Record))>> = true;
 
-// Calls `write(priority, tag, text)` with what a record of either generation holds; not at all with
-// one that the library at hand does not have, since nothing can hold anything then.
+// Calls `write(priority, tag, text)` with the contents of a record of either generation. Does
+// nothing for a record type that the installed library does not define: no such record exists.
 template <typename Data, typename Write>
 void ReadLogRecord(const Data* data, const char* text, Write write) {
   if constexpr (kLogLibraryHas<Data>) write(data->priority, data->tag, text);

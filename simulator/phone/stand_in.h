@@ -1,6 +1,7 @@
-// Shared by the stand-ins inside the tool's process: the phone's settings, the journal, and ways to
-// stay unseen. Each of the two libraries has these for itself. Nothing here is destroyed at exit,
-// since the tool's last output is recorded after the destructors have run.
+// Shared by the stand-ins inside the tool's process: the phone's settings, the journal, and means
+// to leave no traces in the tool, such as a changed errno. Each of the two libraries has its own
+// copy. Nothing here is destroyed at exit, because the tool's last output is recorded after the
+// destructors have run.
 #pragma once
 
 #include <cerrno>
@@ -8,18 +9,18 @@
 #include "simulator/phone/journal.h"
 #include "simulator/phone/settings.h"
 
-// The mark of a function that takes the place of another library's; all else stays hidden.
+// Marks a function that replaces one of another library. All other functions are hidden.
 #define STAND_IN extern "C" __attribute__((visibility("default")))
 
 namespace simulator {
 
-// The phone of this process, read from the environment when it is first asked for.
+// The phone of this process. The first call reads it from the environment.
 const PhoneSettings& ThisPhone();
 
-// Appends `event` to the journal; without one nothing is written.
+// Appends `event` to the journal. Does nothing if there is no journal.
 void Record(const Event& event);
 
-// Leaves errno as it was before, on every way out.
+// Restores errno at the end of its scope.
 class ErrnoKeeper {
  public:
   ErrnoKeeper() : errno_(errno) {}

@@ -1,4 +1,4 @@
-// Text for a person's eyes: what may be shown of hostile bytes, the marks, and the colours.
+// Text for a terminal: makes hostile bytes harmless, and adds colours.
 #pragma once
 
 #include <string>
@@ -6,20 +6,20 @@
 
 namespace simulator {
 
-// How the one who reads sees it.
+// The abilities of the terminal.
 struct Look {
   bool has_colours = false;
-  bool has_utf8 = true;  // else nothing but ASCII is shown
+  bool has_utf8 = true;  // else only ASCII is shown
 };
 
-// How standard output is read: in colours on a terminal, unless NO_COLOR is set; in UTF-8 where the
-// locale's characters are.
+// The abilities of standard output: colours on a terminal, unless NO_COLOR is set; UTF-8 if the
+// locale's characters are UTF-8.
 Look LookOfStandardOutput();
 
-// `bytes` without anything that a terminal would obey or that would mislead the eye: control
-// characters, bytes that are not UTF-8, and characters that turn the direction of writing are shown
-// as \xNN, byte by byte. Where `look` has only ASCII, so are all other characters. A line end at
-// the end is left out.
+// Returns `bytes` without anything that controls a terminal or misleads its reader. Control
+// characters, bytes that are not UTF-8, and characters that change the direction of writing are
+// shown as \xNN, byte by byte. If `look` has no UTF-8, so are all characters outside ASCII. A line
+// end at the end is removed.
 std::string Printable(std::string_view bytes, const Look& look);
 
 enum class Colour { kPlain, kGreen, kRed, kYellow };
@@ -27,7 +27,7 @@ enum class Colour { kPlain, kGreen, kRed, kYellow };
 // `text` in the colour, if there are colours.
 std::string Coloured(const std::string& text, Colour colour, const Look& look);
 
-// How many columns a printable text takes, each character counting as one.
+// The number of columns of a printable text. Each character counts as one column.
 size_t Columns(std::string_view text);
 
 }  // namespace simulator

@@ -11,7 +11,7 @@ namespace simulator {
 
 namespace {
 
-// Values as JSON: objects are lists of keys and values that are JSON already.
+// The members of a JSON object: keys, and values that are already JSON.
 using Members = std::vector<std::pair<const char*, std::string>>;
 
 std::string Object(const Members& members) {
@@ -67,7 +67,8 @@ std::string SignerJson(const std::string& scheme, const CertificateFacts& signer
   return Object(members);
 }
 
-// The key of the JAR signature is the kernel's, even where the certificate shows another one.
+// The JAR signature is shown with the key that the kernel got, even if the certificate shows
+// another one.
 std::string SignersJson(const Report& report) {
   std::vector<std::string> signers;
   if (report.signer || report.key) {
@@ -99,7 +100,7 @@ std::string NamesJson(const std::vector<std::string>& names) {
   return List(names, [](const std::string& name) { return EncodeText(name); });
 }
 
-// Whether the entries are as the manifest lists them, and at how many of them the tool looked.
+// The result of comparing the entries with the manifest, and the number at which the tool looked.
 std::string EntriesJson(const Protection& all) {
   const auto share = [](const Share& counted, Members members) {
     members.insert(members.begin(), {{"entries", std::to_string(counted.entries)},
@@ -157,7 +158,7 @@ std::string RangeJson(const RangeJudgement& range) {
   return Object(members);
 }
 
-// The tool beside the simulator was built with it, and has its version.
+// The tool beside the simulator was built together with it, so it has the same version.
 std::string ToolJson(const ToolIdentity& tool) {
   Members members = {{"sha256", EncodeText(tool.sha256)}};
   if (tool.is_own) members.emplace_back("version", EncodeText(APKTOOLKIT_VERSION));

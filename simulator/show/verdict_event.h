@@ -1,4 +1,4 @@
-// The journal's last word on a file: its report as one event (docs/journal.md).
+// The last event of a file in the journal: its report as one line (docs/journal.md).
 #pragma once
 
 #include <string>
@@ -7,7 +7,7 @@
 
 namespace simulator {
 
-// The whole line, with its end.
+// Returns the whole line, with its line feed.
 std::string VerdictEvent(const Report& report);
 
 }  // namespace simulator

@@ -58,7 +58,7 @@ long GrowthOfOpening(const Bytes& archive) {
   return PeakGrowth([&] { return !OpenPackage(archive).apk.IsApk(); });
 }
 
-constexpr long kLittleMemory = 100 * kMegabyte;  // for a lie of 4 GB
+constexpr long kLittleMemory = 100 * kMegabyte;  // for a false length of 4 GB
 
 TEST(ApkMemory, GarbageThatDeclaresGigabytesTouchesLittle) {
   ZipItem item{kAndroidManifestName, {}, true};

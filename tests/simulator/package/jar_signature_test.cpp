@@ -1,4 +1,4 @@
-// The facts of a JAR signature: by the tool's own code, and as others read it.
+// The facts of a JAR signature, as the tool's own code and as other readers find them.
 #include <gtest/gtest.h>
 
 #include <algorithm>
@@ -55,7 +55,7 @@ TEST(ToolKey, MayBeAPartOfTheModulus) {
   EXPECT_EQ(jar.key->size, 100U);
 }
 
-// The tool takes one zero away, however many there are.
+// The tool removes only one leading zero, even if there are more.
 TEST(ToolKey, MayBeginWithAZero) {
   const JarSignatureFacts jar = SignatureOf(WithKey(Concat({{0, 0}, Modulus()}), kExponent));
   ASSERT_TRUE(jar.key.has_value());
@@ -102,7 +102,7 @@ TEST(JarSignatureFacts, CertificateThatTheToolDoesNotReadIsNotShown) {
   const Bytes certificate = SignatureBlock().SignerCertificate().Build();
   const auto at = std::search(block.begin(), block.end(), certificate.begin(), certificate.end());
   ASSERT_NE(at, block.end());
-  // A0 82 hh ll becomes A0 83 00 hh ll, and what is around it is as long as it says no more.
+  // A0 82 hh ll becomes A0 83 00 hh ll. The lengths of the elements around it are then wrong.
   const auto inserted = block.insert(at - 2, 0);
   *(inserted - 1) = 0x83;
   const JarSignatureFacts jar = SignatureOf(package);
@@ -115,7 +115,7 @@ TEST(JarSignatureFacts, SignerThatNamesAnotherCertificateIsSeen) {
   options.block.serial = der::Integer(99);
   EXPECT_TRUE(SignatureOf(MakePackage(options)).names_other_certificate);
   EXPECT_FALSE(SignatureOf(MakePackage()).names_other_certificate);
-  // Without a signer that reads there is nobody to name one. The certificate has a key identifier.
+  // A block without a readable signer names no certificate. The certificate has a key identifier.
   Certificate certificate;
   certificate.extensions = {Extension("2.5.29.14", der::OctetString({1, 2, 3}))};
   options.block.certificates = certificate.Build();
@@ -155,7 +155,8 @@ TEST(SignatureFile, SaysWhichOtherSchemesThereAre) {
   EXPECT_EQ(claimed("no signature file"), "");
 }
 
-// The first section that has one counts, and of its digests the one that the tool takes.
+// The first section with a digest of the manifest counts. If it has several, the tool's choice
+// counts.
 TEST(SignatureFile, MayHaveTheManifestsSha1Digest) {
   const auto has_sha1 = [](const std::string& text) {
     PackageOptions options;
