@@ -1,6 +1,6 @@
-// The facts that the simulator finds in a file: its kind, and, of a package, the signer, the
-// entries that the signature lists, and the libraries that lie beside it. The facts explain the
-// tool's answer and decide nothing. A malformed part counts as missing.
+// The facts that the simulator finds in a file: its kind and, for a package, its signer, the
+// entries that the signature lists, and the libraries beside it. The facts explain the tool's
+// answer and decide nothing. A malformed part counts as missing.
 #pragma once
 
 #include <cstdint>
@@ -22,7 +22,7 @@ enum class FileKind {
   kSpecial,  // a device, a pipe or a socket
   kEmpty,
   kText,
-  kCutArchive,  // begins like an archive and has no end
+  kCutArchive,  // begins like an archive, but its end is missing
   kNoArchive,
   kArchive,
 };
@@ -33,53 +33,53 @@ struct NewerSignerFacts {
   CertificateFacts certificate;
 };
 
-// A library lib/….so of the package, and what lies where the tool looks for it.
+// A library lib/….so of the package, and the file at the place where the tool looks for it.
 struct LibraryFacts {
   std::string entry;  // its name in the package
-  // Where the installer puts it, from the package's directory on; empty: no phone of this kind
-  // does.
+  // The installer's place for it, relative to the package's directory; empty: no phone of this kind
+  // installs it.
   std::string place;
-  bool is_met = true;          // by the tool's walk over the libraries
-  int error = 0;               // of opening the file as the tool does; 0: it can be opened
-  bool has_directory = false;  // the file's directory is there
+  bool is_met = true;          // true if the tool's walk over the libraries comes to it
+  int error = 0;               // errno of opening the file as the tool does; 0: it can be opened
+  bool has_directory = false;  // the file's directory exists
 };
 
 struct PackageFacts {
   FileKind kind = FileKind::kUnreadable;
-  int error = 0;              // of opening the file
-  bool is_read_only = false;  // its file system is
-  bool was_changed = false;   // while it was looked at
+  int error = 0;              // errno of opening the file
+  bool is_read_only = false;  // its file system is read-only
+  bool was_changed = false;   // the file was changed while it was examined
   uint64_t size = 0;          // of the file, in bytes
   std::string sha256;         // of the file's bytes; empty: it was not read to its end
-  uint64_t packages = 0;      // of a directory: the files in it that have a package's name
-  // The zip library's; 0: it is an archive, and what follows is filled.
+  uint64_t packages = 0;      // for a directory: the number of files in it with package names
+  // The result of the zip library; if it is 0, the file is an archive, and the members below are
+  // filled.
   int32_t archive_result = -1;
 
-  std::string entry_twice;  // the first entry that stands in it again; empty: none does
+  std::string entry_twice;  // the first name that the archive has twice; empty: none
 
   AndroidManifest manifest;
   JarSignatureFacts jar;
   std::vector<NewerSignerFacts> newer;
   bool has_damaged_signing_block = false;
-  std::vector<std::string> too_long;  // what is there and was not looked into, for its length
+  std::vector<std::string> too_long;  // the parts that were not read because they are too long
   std::vector<ListedEntry> entries;
-  std::vector<std::string> missing;  // names that the manifest lists and the archive does not have
+  std::vector<std::string> missing;  // names in the manifest that the archive does not have
   // In the order in which the tool walks through them, damaged ones last.
   std::vector<LibraryFacts> libraries;
 };
 
-// Looks at the file at `path`, and at the libraries beside it. Neither a pipe nor a device is read,
-// and nothing is waited for. Once `is_late` says so, no further entry is compared with the
-// manifest.
+// Looks at the file at `path`, and at the libraries beside it. Reads no pipes and no devices, and
+// never waits. Compares no more entries with the manifest after `is_late` returns true.
 PackageFacts LookAt(
     const std::string& path, const IsLate& is_late = [] { return false; });
 
-// The SHA-256 digest of the bytes of an open file, in lower-case hexadecimal; empty once it is
-// late, and where they cannot be read.
+// The SHA-256 digest of the bytes of an open file, in lower-case hexadecimal; empty if they cannot
+// be read, or if `is_late` returns true before their end.
 std::string FileSha256(
     int fd, const IsLate& is_late = [] { return false; });
 
-// The names of the schemes after v1 that somebody signed with, each once, in the file's order.
+// The names of the file's schemes after v1, each once, in the file's order.
 std::vector<std::string> NewerSchemes(const PackageFacts& facts);
 
 }  // namespace simulator

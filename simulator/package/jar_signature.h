@@ -15,10 +15,10 @@
 
 namespace simulator {
 
-// An RSA key as the tool reads it from a signature block, which need not be what the certificate
-// shows to others.
+// An RSA key as the tool reads it from a signature block. Other readers of the certificate may find
+// another key.
 struct ToolKey {
-  std::string modulus_sha256;  // what a payload holds of the key, in hexadecimal
+  std::string modulus_sha256;  // the key's digest in a payload, in hexadecimal
   uint32_t size = 0;           // of the modulus, in bytes, as the tool counts them
   int bits = 0;
   int32_t exponent = 0;
@@ -27,22 +27,22 @@ struct ToolKey {
 
 struct JarSignatureFacts {
   Archive::ReadResult manifest = Archive::ReadResult::kMissing;  // META-INF/MANIFEST.MF
-  // Those entries META-INF/*.SF, in the tool's order: it takes the first.
+  // The entries META-INF/*.SF, in the tool's order. The tool uses the first one.
   std::vector<std::string> signature_files;
   std::string claimed_schemes;        // X-Android-APK-Signed, such as "2, 3"; empty: not stated
   bool has_manifest_digest = false;   // the signature file states one, of any kind
   bool has_sha1_of_manifest = false;  // the one that the tool takes is a SHA-1 digest
-  // The block that the tool looks for, "RSA"; or one of another kind of key, if that alone is
-  // there.
+  // The name of the block that the tool looks for, "RSA"; or that of a block for another kind of
+  // key, if there is only such a block.
   std::string block_name;
   bool has_block = false;
-  // None when the tool does not read one.
+  // None if the tool cannot read a key.
   std::optional<ToolKey> key;
 
-  SignatureBlockFacts block;  // as others read it; its certificate is not kept
-  // The first certificate; where the tool reads a key, only if it is the one that the tool reads.
+  SignatureBlockFacts block;  // as a strict reader finds it; its certificate is not kept
+  // The first certificate. If the tool reads a key, it must be the one that the tool reads.
   std::optional<CertificateFacts> certificate;
-  bool names_other_certificate = false;  // the first signer is somebody else's, by its identifier
+  bool names_other_certificate = false;  // the first signer's identifier names another certificate
 };
 
 JarSignatureFacts ReadJarSignature(Archive* archive);

@@ -1,7 +1,7 @@
-// The journal of a simulated run: one JSON object a line, in the order in which things happened
-// (docs/journal.md is its schema). Written by the stand-ins inside the tool and by apktoolkit-sim
-// around it, each line with one appending write, so that the order of the writes is the order of
-// the lines. Needs no JSON library: the stand-ins are to bring nothing into the tool's process.
+// The journal of a simulated run: one JSON object a line, in the order of the events
+// (docs/journal.md describes it). The stand-ins inside the tool and apktoolkit-sim outside it write
+// it. Each line is one appending write, so the lines are in the order of the writes. It needs no
+// JSON library, because the stand-ins must not bring libraries into the tool's process.
 #pragma once
 
 #include <cstdint>
@@ -33,15 +33,16 @@ class Event {
 
   // The whole line, with its end.
   std::string Line() const { return line_ + "}\n"; }
-  // Appends the line to the open file `journal`; false when it could not be written whole.
+  // Appends the line to the open file `journal`. Returns false if it could not be written whole.
   bool AppendTo(int journal) const;
 
  private:
   std::string line_;
 };
 
-// Opens the journal at `path` for appending, close-on-exec, and keeps its descriptor out of the
-// way of those that the process opens itself; -1 when it cannot be opened.
+// Opens the journal at `path` for appending, close-on-exec. Its descriptor is a high one, so that
+// the process's own files get the same descriptors as without it. Returns -1 if it cannot be
+// opened.
 int OpenJournal(const char* path);
 
 }  // namespace simulator

@@ -1,9 +1,10 @@
-// The bytes that the phone's kernel has signed so far. A file is trusted, under any name, as long
-// as it has bytes that were signed.
+// The bytes that the phone's kernel has signed so far. A file with these bytes is trusted, under
+// any name.
 //
-// With a directory, SHA-256 digests are remembered across runs. Each is the name of a file in the
-// directory, which holds the path of the signed file, for the reader. Without one, files are
-// remembered as long as this object lives, and digested only when another is as long as they are.
+// With a directory, SHA-256 digests are remembered across runs. Each digest is the name of a file
+// in the directory. That file contains the path of the signed file, for people who look there.
+// Without a directory, signed files are remembered as long as this object lives. They are digested
+// only if another file has the same length.
 #pragma once
 
 #include <sys/stat.h>
@@ -18,24 +19,25 @@ namespace simulator {
 
 class SignedBytes {
  public:
-  // `directory` is made when it is not there; empty: nothing is kept beyond this object. Where
-  // `shares` is false, what is added is kept for later runs alone, so that the order of the files
-  // of this run does not matter; then it may be used from several threads.
+  // `directory` is created if it does not exist; empty: nothing is kept beyond this object. If
+  // `shares` is false, added files are trusted only in later runs, so that the order of the files
+  // of this run does not matter. Then several threads may use the object.
   SignedBytes(std::string directory, bool shares)
       : directory_(std::move(directory)), shares_(shares) {}
 
-  // Reads what the directory holds. False when it cannot be used.
+  // Reads the digests in the directory. Returns false if the directory cannot be used.
   bool Load();
 
-  // Whether the file at `path` has bytes that were signed. Other than regular files are never
-  // trusted, and neither is one that took longer to read than there is time.
+  // True if the file at `path` has bytes that were signed. False for a file that is not regular, or
+  // that cannot be read before the deadline.
   bool Holds(const std::string& path, const Deadline& deadline);
 
-  // Remembers the present bytes of the file at `path`. False when they cannot be kept.
+  // Remembers the present bytes of the file at `path`. Returns false if they cannot be kept.
   bool Add(const std::string& path, const Deadline& deadline);
 
  private:
-  // A file as it was when it was signed; it is digested when that is needed, if it is still so.
+  // A file in its state at the signing. It is digested later, if needed, and only if its state is
+  // still the same.
   struct Seen {
     std::string path;
     struct stat state;

@@ -23,16 +23,15 @@ struct ToolEnd {
   int value;  // kExited: the status. kKilled: the signal. kNotStarted: the errno. Otherwise 0.
 };
 
-// Runs the command to its end. Its standard output goes nowhere, since the journal has it; its
-// standard input and error are this process's. When the deadline passes, the tool is
-// killed.
+// Runs the command to its end, or kills it after the deadline. Discards its standard output,
+// because the journal has it. Its standard input and error are those of this process.
 ToolEnd RunTool(const ToolCommand& command, const Deadline& deadline);
 
 // The program that is started: the runner, or else the tool.
 const std::string& ProgramOf(const ToolCommand& command);
 
-// The directory that this program lies in, without a closing "/". The tool lies beside it, and the
-// stand-ins in ../lib/apktoolkit, in the build tree as where it is installed.
+// The directory of this program, without a "/" at the end. The tool is in the same directory, and
+// the stand-ins are in ../lib/apktoolkit, both in the build tree and in an installation.
 std::string ProgramDirectory();
 
 }  // namespace simulator

@@ -53,7 +53,7 @@ bool OutputFile::IsSameAs(const OutputFile& other) const {
   return Resolved(path_) == Resolved(other.path_) || fs::equivalent(path_, other.path_, error);
 }
 
-// A pipe is waited for, until somebody reads it, but not for long.
+// Waits up to two seconds for a reader of a pipe.
 bool OutputFile::Open() {
   constexpr int kMostTries = 20;
   constexpr useconds_t kPause = 100'000;

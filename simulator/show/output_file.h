@@ -1,5 +1,5 @@
-// A file that the command line names to be written: the journal, the page, or a report for another
-// program. Nothing but an earlier one of the same kind is ever replaced by it.
+// An output file that the command line names: the journal, the page, or a report for another
+// program. It replaces an existing file only if that is empty or of the same kind.
 #pragma once
 
 #include <optional>
@@ -12,28 +12,29 @@
 namespace simulator {
 
 struct OutputKind {
-  const char* option;      // that names the file
+  const char* option;      // the option with the file's name
   const char* name;        // such as "journal"
-  std::string_view start;  // what each file of the kind begins with
+  std::string_view start;  // the first bytes of each file of this kind
 };
 
 class OutputFile {
  public:
-  // `path` may be empty: then nothing is wanted, and all that is below succeeds and does nothing.
+  // If `path` is empty, no file is wanted: Open and Append succeed and do nothing.
   OutputFile(const OutputKind& kind, std::string path) : kind_(kind), path_(std::move(path)) {}
 
   bool IsWanted() const { return !path_.empty(); }
   const char* option() const { return kind_.option; }
 
-  // Why the file must not be written to: it holds something else, or is one of `inputs`. None when
-  // it may.
+  // Returns a reason not to write the file: it has other contents, or is one of `inputs`. Else
+  // none.
   std::optional<std::string> Objection(const std::vector<std::string>& inputs) const;
-  // Whether this file and `other` are one, be it under two names. Devices and pipes never are.
+  // True if this file and `other` are the same file, even under two names. False for devices and
+  // pipes.
   bool IsSameAs(const OutputFile& other) const;
 
-  // Begins the file anew. False, with errno set, when it cannot be written.
+  // Opens and empties the file. Returns false, with errno set, if it cannot be written.
   bool Open();
-  // The same for what comes next in it.
+  // Appends `text`. Returns false, with errno set, if it cannot be written.
   bool Append(std::string_view text) const;
   // The message for the user after a failure.
   std::string ErrorText() const;

@@ -1,5 +1,5 @@
-// Telling of each file in the ways that were asked for: on the terminal, in the journal, on the
-// page, in reports for other programs.
+// Shows the result of each file in the requested forms: on the terminal, in the journal, on the
+// page, and in reports for other programs.
 #pragma once
 
 #include <optional>
@@ -17,33 +17,35 @@ namespace simulator {
 
 struct ShowOptions {
   Detail detail = Detail::kUsual;  // of the text
-  std::string journal;             // where the journal is kept; empty: it is not
-  std::string html;                // where the page is written; empty: it is not
-  std::string junit;               // where the JUnit report is written; empty: it is not
-  std::string sarif;               // where the SARIF log is written; empty: it is not
-  std::string tool;                // that --tool names; empty: the one of this build
-  bool json = false;               // the journal on standard output in place of the text
+  std::string journal;             // the path of the journal; empty: none
+  std::string html;                // the path of the page; empty: none
+  std::string junit;               // the path of the JUnit report; empty: none
+  std::string sarif;               // the path of the SARIF log; empty: none
+  std::string tool;                // the argument of --tool; empty: the tool of this build
+  bool json = false;               // prints the journal instead of the text
 };
 
 class Presenter {
  public:
-  // `file_count` files are to be told of.
+  // `file_count`: the number of files that will be shown.
   Presenter(const ShowOptions& options, size_t file_count);
 
-  // Why nothing may begin, for the sake of the user's files, of which `inputs` are to be read.
+  // Returns a reason not to begin if an output would overwrite a file of the user, or one of
+  // `inputs`, or if two outputs have the same path. Else none.
   std::optional<std::string> Objection(const std::vector<std::string>& inputs) const;
-  // False when what is to be written cannot be; that was told.
+  // Opens the outputs. Returns false, after an error message, if one of them cannot be written.
   bool Begin();
   // `journal` are the lines of the run, from "start" to "exit".
   void Show(const Report& report, const std::string& journal);
-  // Of a run of apktoolkit-verify: what it printed. `report` says why it could not be simulated.
+  // Shows the output of a run of apktoolkit-verify. `report` says why it could not be simulated.
   void ShowAnswer(const RunRecord& run, const Report& report, const std::string& journal);
   void ShowProgress(const std::string& file, int seconds);
-  // Tells what belongs to the end. The highest status of all; kCannotSimulate at least when
-  // something could not be written. Those of `files`, all that were to be told of, that nothing was
-  // told of, because the run was interrupted, are errors in the reports for other programs.
+  // Writes the summary, the page and the reports. `files` are all files of the command line. If the
+  // run was interrupted, those that were not shown are errors in the reports for other programs.
+  // Returns the highest status of all files, or at least kCannotSimulate if an output failed.
   int Finish(const std::vector<std::string>& files);
-  // In place of all that: for `problem`, no file can be simulated. The status to end with.
+  // Called instead of all functions above if no file can be simulated because of `problem`. Returns
+  // the exit status.
   int GiveUp(const std::vector<std::string>& files, const std::string& problem);
 
  private:
@@ -69,14 +71,14 @@ class Presenter {
   bool is_interrupted_ = false;  // while a file was looked at
   size_t shown_ = 0;             // files, by a verdict or an answer
   bool is_progress_shown_ = false;
-  std::string missing_;  // why the installer was not asked; empty: it was, or nobody wanted it
+  std::string missing_;  // why the verifier could not be asked; empty: no such problem
   int status_ = kAllSigned;
 };
 
-// Tells the user why the program ends with `status`, which is the result.
+// Prints `message`, an error, and returns `status`.
 int Complain(int status, const std::string& message);
 
-// The status, if all that was printed could be written.
+// Returns `status`, or at least kCannotSimulate if standard output could not be written.
 int EndWith(int status);
 
 }  // namespace simulator

@@ -1,5 +1,5 @@
-// The words of a report, for the terminal and the page alike. Names and details in them come from
-// the files as they are. The caller makes them fit to be shown.
+// The words of a report, for both the terminal and the page. They contain names and details from
+// the files, unchanged. The caller must escape them.
 #pragma once
 
 #include <optional>
@@ -28,29 +28,28 @@ const VerdictWords& WordsOf(Verdict verdict);
 // "good", "mixed" or "bad", for programs.
 const char* MoodCode(Mood mood);
 
-// Such as "3 files: 1 signed, 2 refused". Of a run that was interrupted also that it was, and
-// before how many more files: `unseen`.
+// Returns a text such as "3 files: 1 signed, 2 refused". For an interrupted run, which has
+// `unseen`, it also says so, with that number of files that were not reached.
 std::string Summary(const std::vector<Verdict>& verdicts, std::optional<size_t> unseen = {});
 
-// Whose package it is: its name, the signer and his key, and, where phones install it for another,
-// that one. `ellipsis` stands in the midst of a digest.
+// The owner of the package: its name, the signer and the key and, if phones install it for another
+// signer, that signer. `ellipsis` replaces the middle of a digest.
 std::vector<std::string> OwnerFacts(const Report& report, const char* ellipsis);
 
-// The JAR signer and his key, such as "CN=Vault, RSA-2048, key 98302ce8…f64646".
+// The JAR signer and the key, such as "CN=Vault, RSA-2048, key 98302ce8…f64646".
 std::string SignerText(const Report& report, const char* ellipsis);
 
-// For whom phones install it, if that is another than the JAR signer; else empty.
+// The signer for whom phones install the package, if it is not the JAR signer; else empty.
 std::string OtherOwnerText(const Report& report);
 
 // The warnings that are alarms.
 std::vector<std::string> AlarmFacts(const Report& report);
 
-// Why the verdict is not better: the reason of the item that it comes from; empty if nothing was
-// refused.
+// The reason of the item that decides the verdict; empty if nothing was refused.
 std::string DecisiveReason(const Report& report);
 
-// The line of the verdict has these behind the file: the decisive reason, or else whose package it
-// is; then a signer who was not expected, the alarms, and the number of all warnings.
+// The facts after the file's name in the verdict's line: the decisive reason or, if nothing was
+// refused, the owner; then an unexpected signer, the alarms, and the number of all warnings.
 std::vector<std::string> HeadFacts(const Report& report, const char* ellipsis);
 
 // The mark before a line.
@@ -75,12 +74,12 @@ inline const std::string& PathForTool(const Report& report) {
   return report.installed.empty() ? report.path : report.installed;
 }
 
-// Of a report that has `installed`.
+// For a report with `installed`.
 inline constexpr char kLaidOutText[] =
     "libraries laid out beside it as an installer does; --install=no leaves it as it lies";
 
-// Whether what to do is said below the item. It is said once for neighbours that need the same, and
-// not where it follows from another; `next` is what stands below, null for nothing.
+// True if the cure is shown below the item. It is shown once for neighbours with the same cure, and
+// not for a consequence of another cause. `next` is the next item, or null.
 bool HasCure(const Item& item, const Item* next);
 
 // The text at the link, or "not reached" beyond a break.
@@ -88,9 +87,9 @@ std::string TextOf(const Link& link);
 
 // Label and value for each fact. The labels are those of apksigner, so that one search finds both.
 using Rows = std::vector<std::pair<std::string, std::string>>;
-// Of a certificate as others read it.
+// The facts of a certificate, as readers other than the tool find them.
 Rows CertificateRows(const CertificateFacts& certificate);
-// Of the JAR signature: the certificate, and what the kernel got of the key.
+// The facts of the JAR signature: its certificate, and the digest of the key for the kernel.
 Rows SignerRows(const Report& report);
 
 // The words for a share of the package.
