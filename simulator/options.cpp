@@ -191,7 +191,7 @@ void AddInstallation(CLI::App* app, Options* options) {
     const bool is_known =
         name == kInstallNo || std::any_of(std::begin(kAbis), std::end(kAbis),
                                           [&name](const auto& abi) { return name == abi.name; });
-    return is_known ? std::string() : "there are phone, all, arm64, arm and no, and no " + name;
+    return is_known ? std::string() : name + " is not one of phone, all, arm64, arm and no";
   };
   app->add_option_function<std::string>(kInstall, install,
                                         "First lay out the libraries, as an installer\n"
@@ -216,7 +216,7 @@ void AddInstaller(CLI::App* app, Options* options) {
   const auto is_use = [](const std::string& name) {
     const bool is_known = std::any_of(std::begin(kInstallerUses), std::end(kInstallerUses),
                                       [&name](const auto& each) { return name == each.name; });
-    return is_known ? std::string() : "there are auto, required and off, and no " + name;
+    return is_known ? std::string() : name + " is not one of auto, required and off";
   };
   app->add_option_function<std::string>("--installer", use,
                                         "Also ask apksig, the verifier of a phone's\n"
@@ -229,7 +229,7 @@ void AddInstaller(CLI::App* app, Options* options) {
   const auto is_range = [](const std::string& text) {
     LevelRange levels = {0, 0};
     return ReadLevels(text, &levels) ? std::string()
-                                     : text + " is no API level and no range such as 27-33";
+                                     : text + " is not an API level or a range such as 27-33";
   };
   app->add_option_function<std::string>("--api", set,
                                         "Ask about phones with these API levels\n"
@@ -243,7 +243,7 @@ void AddGate(CLI::App* app, Options* options) {
   const auto is_digest = [](const std::string& text) {
     return ReadDigest(text) ? std::string()
                             : text +
-                                  " is no SHA-256 digest: 64 hexadecimal digits, or 32 pairs "
+                                  " is not a SHA-256 digest: 64 hexadecimal digits, or 32 pairs "
                                   "of them with colons between";
   };
   const auto add = [signers](const std::vector<std::string>& texts) {
@@ -290,7 +290,7 @@ void AddOutput(CLI::App* app, Options* options) {
 void AddRun(CLI::App* app, Options* options, std::string* runner) {
   // "nan" is in every range.
   const auto is_number = [](const std::string& text) {
-    return std::isnan(strtod(text.c_str(), nullptr)) ? text + " is no number" : std::string();
+    return std::isnan(strtod(text.c_str(), nullptr)) ? text + " is not a number" : std::string();
   };
   app->add_option("--jobs", options->run.jobs, "Look at N files at the same time [default: 1]")
       ->type_name("N")
