@@ -27,6 +27,7 @@ int main(int argc, char** argv) {
   Gate gate(options.gate);
   Presenter presenter(options.show, files.size());
   std::vector<std::string> names;
+  names.reserve(files.size());
   for (const ListedFile& file : files) names.push_back(file.name);
   std::vector<std::string> inputs = names;
   inputs.push_back(options.files.list);

@@ -18,15 +18,24 @@ import java.io.OutputStream;
 import java.io.PrintStream;
 import java.io.RandomAccessFile;
 import java.nio.BufferOverflowException;
+import java.nio.BufferUnderflowException;
+import java.nio.ByteBuffer;
+import java.nio.ByteOrder;
 import java.nio.charset.StandardCharsets;
 import java.security.cert.X509Certificate;
 import java.util.ArrayList;
+import java.util.Arrays;
 import java.util.List;
+import java.util.SortedSet;
+import java.util.TreeSet;
 
 public final class InstallerVerifier {
     // The levels at which the platform's rules change: 28 reads v3, 30 asks for v2 where an app
     // targets it, 33 reads v3.1.
-    private static final int[] NEW_RULES = {28, 30, 33};
+    private static final int KNOWS_V3 = 28;
+    private static final int ASKS_FOR_V2 = 30;
+    private static final int KNOWS_V31 = 33;
+    private static final List<Integer> NEW_RULES = List.of(KNOWS_V3, ASKS_FOR_V2, KNOWS_V31);
 
     // Of each kind, so many errors, warnings and signers are told, and so much of a text.
     private static final int MOST = 100;
@@ -59,6 +68,8 @@ public final class InstallerVerifier {
                 return object("ranges", "[" + tooOld(first, last, lowest).json() + "]");
             }
             return object("ranges", ranges(source, lowest, last));
+        } catch (UnknownScheme unknown) {
+            return object("failure", text(unknown.getMessage()));
         } catch (Throwable failure) {
             return object("failure", text(failure.toString()));
         }
@@ -74,26 +85,41 @@ public final class InstallerVerifier {
         }
     }
 
-    // All levels at once; where that is refused, those of equal rules each by itself.
+    // The verifier answers for all levels of a range at once, and then names one signer for them. So
+    // a package with v3 is verified for 27 and for later levels apart, and at each level at which
+    // one of its v3 signers begins or ends. Other packages are verified for all levels at once, and
+    // only where that is refused, for those of equal rules each by itself.
     private static String ranges(DataSource source, int first, int last) throws Exception {
-        Range whole = verify(source, first, last);
-        if (whole.isVerified) {
-            return "[" + whole.json() + "]";
+        SortedSet<Integer> starts = new TreeSet<>();
+        boolean hasNewer = NewerSigners.read(source, starts);
+        List<Range> ranges = verifyEach(source, first, last, starts, hasNewer);
+        boolean isRefused = ranges.stream().anyMatch(range -> !range.isVerified);
+        if (isRefused) {
+            starts.addAll(NEW_RULES);
+            ranges = verifyEach(source, first, last, starts, hasNewer);
         }
-        List<Range> ranges = new ArrayList<>();
-        int start = first;
-        for (int level : NEW_RULES) {
-            if (level > start && level <= last) {
-                add(verify(source, start, level - 1), ranges);
-                start = level;
-            }
-        }
-        add(start == first ? whole : verify(source, start, last), ranges);
         List<String> told = new ArrayList<>();
         for (Range range : ranges) {
             told.add(range.json());
         }
         return list(told);
+    }
+
+    // One range from each start to the next.
+    private static List<Range> verifyEach(DataSource source, int first, int last,
+            SortedSet<Integer> starts, boolean hasNewer) throws Exception {
+        List<Range> ranges = new ArrayList<>();
+        int start = first;
+        while (true) {
+            SortedSet<Integer> later = starts.tailSet(start + 1);
+            boolean isLast = later.isEmpty() || later.first() > last;
+            int end = isLast ? last : later.first() - 1;
+            add(verify(source, start, end, hasNewer), ranges);
+            if (isLast) {
+                return ranges;
+            }
+            start = later.first();
+        }
     }
 
     // Neighbours of which the same is said are one range.
@@ -103,6 +129,15 @@ public final class InstallerVerifier {
             before.last = range.last;
         } else {
             ranges.add(range);
+        }
+    }
+
+    // Phones go by a scheme that this version of the verifier does not know.
+    private static final class UnknownScheme extends Exception {
+        private static final long serialVersionUID = 1;
+
+        UnknownScheme(String words) {
+            super(words);
         }
     }
 
@@ -124,7 +159,18 @@ public final class InstallerVerifier {
         }
     }
 
-    private static Range verify(DataSource source, int first, int last) throws Exception {
+    // Phones of API 30 and later ask for v2 where an app targets 30 or more. The verifier asks for it
+    // only where the range reaches up to the target, so its range has no end there. That changes
+    // nothing else where no signer is for some levels alone.
+    private static Range verify(DataSource source, int first, int last, boolean hasNewer)
+            throws Exception {
+        if (first >= KNOWS_V31 && !hasMethod(ApkVerifier.Result.class, "isVerifiedUsingV31Scheme")
+                && NewerSigners.hasV31(source)) {
+            throw new UnknownScheme(
+                    "this apksig does not know v3.1, by which phones of API 33 and later install it;"
+                    + " --api 27-32 asks about all others");
+        }
+        int reach = !hasNewer && last >= ASKS_FOR_V2 ? Integer.MAX_VALUE : last;
         Range range = new Range(first, last);
         List<String> schemes = new ArrayList<>();
         List<String> signers = new ArrayList<>();
@@ -134,7 +180,7 @@ public final class InstallerVerifier {
         try {
             ApkVerifier.Result result = new ApkVerifier.Builder(source)
                     .setMinCheckedPlatformVersion(first)
-                    .setMaxCheckedPlatformVersion(last)
+                    .setMaxCheckedPlatformVersion(reach)
                     .build()
                     .verify();
             range.isVerified = result.isVerified();
@@ -150,6 +196,13 @@ public final class InstallerVerifier {
                 throw exception;
             }
             malformed.add(issue("MALFORMED_APK", new Object[0], exception.getMessage()));
+        } catch (RuntimeException exception) {
+            // So the verifier says that nothing in the package is for these levels.
+            if (!String.valueOf(exception.getMessage()).startsWith("APK verified, but has not")) {
+                throw exception;
+            }
+            malformed.add(issue("NO_SIGNATURE_FOR_LEVELS", new Object[0],
+                    "none of its signatures is for these phones"));
         }
         range.said = members("schemes", list(schemes), "signers", list(signers),
                 "errors", malformed.isEmpty() ? list(issues(errors)) : list(malformed),
@@ -193,6 +246,10 @@ public final class InstallerVerifier {
         }
     }
 
+    private static boolean hasMethod(Class<?> type, String name) {
+        return Arrays.stream(type.getMethods()).anyMatch(method -> method.getName().equals(name));
+    }
+
     private static Object ask(Object object, String method) throws Exception {
         return object.getClass().getMethod(method).invoke(object);
     }
@@ -221,6 +278,98 @@ public final class InstallerVerifier {
             texts.add(text(String.valueOf(parameter)));
         }
         return object("issue", text(name), "parameters", list(texts), "text", text(words));
+    }
+
+    // The signers of v3 and v3.1 in the signing block, which are each for a range of levels. Nothing
+    // is verified. A block that is malformed has no signers here; the verifier says what is wrong.
+    private static final class NewerSigners {
+        private static final int V3 = 0xf05368c0;
+        private static final int V31 = 0x1b93ad61;
+        private static final int NO_PHONES_LEVEL = 10_000;
+        private static final int MOST_BYTES = 16 << 20;
+        private static final int MOST_SIGNERS = 100;
+
+        // Adds the levels at which one of them begins, or has just ended, and says whether there
+        // are any.
+        static boolean read(DataSource source, SortedSet<Integer> starts) {
+            boolean hasAny = false;
+            for (int id : new int[] {V3, V31}) {
+                ByteBuffer signers = find(source, id);
+                hasAny = hasAny || signers != null;
+                if (signers != null) {
+                    starts.add(id == V3 ? KNOWS_V3 : KNOWS_V31);
+                    addLevels(signers, starts);
+                }
+            }
+            return hasAny;
+        }
+
+        static boolean hasV31(DataSource source) {
+            return find(source, V31) != null;
+        }
+
+        // A signer is: length, signed data with its length, first level, last level, and more.
+        private static void addLevels(ByteBuffer value, SortedSet<Integer> starts) {
+            try {
+                ByteBuffer signers = take(value);
+                for (int i = 0; i < MOST_SIGNERS && signers.hasRemaining(); i++) {
+                    ByteBuffer signer = take(signers);
+                    take(signer);
+                    long first = signer.getInt();
+                    long last = signer.getInt();
+                    addLevel(first, starts);
+                    addLevel(last + 1, starts);
+                }
+            } catch (BufferUnderflowException | IllegalArgumentException malformed) {
+                return;
+            }
+        }
+
+        // Beyond the levels of any phone a range has no end.
+        private static void addLevel(long level, SortedSet<Integer> starts) {
+            if (level > 0 && level < NO_PHONES_LEVEL) {
+                starts.add((int) level);
+            }
+        }
+
+        // The value of the block's first pair of that ID, or null. A pair is: a length of 8 bytes, an
+        // ID of 4, and the value.
+        private static ByteBuffer find(DataSource source, int wanted) {
+            try {
+                ApkUtils.ZipSections sections = ApkUtils.findZipSections(source);
+                DataSource contents = ApkUtils.findApkSigningBlock(source, sections).getContents();
+                if (contents.size() > MOST_BYTES) {
+                    return null;
+                }
+                ByteBuffer block = contents.getByteBuffer(0, (int) contents.size());
+                block.order(ByteOrder.LITTLE_ENDIAN).position(8).limit(block.limit() - 24);
+                while (block.remaining() >= 12) {
+                    long length = block.getLong();
+                    if (length < 4 || length > block.remaining()) {
+                        return null;
+                    }
+                    ByteBuffer pair = slice(block, (int) length);
+                    if (pair.getInt() == wanted) {
+                        return pair;
+                    }
+                }
+                return null;
+            } catch (Exception malformed) {
+                return null;
+            }
+        }
+
+        private static ByteBuffer take(ByteBuffer bytes) {
+            return slice(bytes, bytes.getInt());
+        }
+
+        // The next bytes of the buffer, which then stands behind them.
+        private static ByteBuffer slice(ByteBuffer bytes, int length) {
+            ByteBuffer part = bytes.slice().order(ByteOrder.LITTLE_ENDIAN);
+            part.limit(length);
+            bytes.position(bytes.position() + length);
+            return part;
+        }
     }
 
     // ---- JSON: values are texts of JSON already.

@@ -113,7 +113,8 @@ bool HasProgram(const std::string& name) {
   const char* const path = getenv("PATH");
   std::istringstream directories(path == nullptr ? "" : path);
   for (std::string directory; std::getline(directories, directory, ':');) {
-    if (access((directory + "/" + name).c_str(), X_OK) == 0) return true;
+    directory.append("/").append(name);
+    if (access(directory.c_str(), X_OK) == 0) return true;
   }
   return false;
 }

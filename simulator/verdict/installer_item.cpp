@@ -36,10 +36,15 @@ std::string LevelText(const LevelRange& levels) {
 }
 
 std::string TakersText(const Judgement& judgement) {
-  // If all phones take it, there is one range.
-  if (judgement.ranges.size() != 1 || !judgement.ranges[0].is_verified) return {};
-  return "phones of " + LevelText(judgement.ranges[0].levels) + " take it, by " +
-         Joined(judgement.ranges[0].schemes);
+  if (judgement.ranges.empty() || !LevelsText(judgement.ranges, false).empty()) return {};
+  std::vector<std::string> schemes;
+  for (const RangeJudgement& range : judgement.ranges) {
+    for (const std::string& scheme : range.schemes) {
+      const bool is_known = std::find(schemes.begin(), schemes.end(), scheme) != schemes.end();
+      if (!is_known) schemes.push_back(scheme);
+    }
+  }
+  return "phones of " + LevelsText(judgement.ranges, true) + " take it, by " + Joined(schemes);
 }
 
 // Phones verify the newest scheme that they know, and all of its signers count.
@@ -71,6 +76,7 @@ std::string LevelsText(const std::vector<RangeJudgement>& ranges, bool is_verifi
     }
   }
   std::vector<std::string> texts;
+  texts.reserve(levels.size());
   for (const LevelRange& each : levels) texts.push_back(LevelText(each));
   return Joined(texts);
 }

