@@ -13,7 +13,8 @@ namespace {
 void Refuse(ItemKind kind, const char* name, const Reason& reason, Report* report);
 CertificateFacts JarSigner(const Report& report);
 std::vector<const CertificateFacts*> NewestSigners(const RangeJudgement& range);
-std::vector<CertificateFacts> InstalledSigners(const Judgement& judgement);
+std::vector<CertificateFacts> InstalledSigners(const Report& report);
+bool IsJudged(const Report& report);
 bool HasForgeableKey(const Report& report);
 bool IsOneOf(const std::vector<std::string>& digests, const CertificateFacts& signer);
 bool AreSameSigner(const CertificateFacts& one, const CertificateFacts& other);
@@ -69,19 +70,25 @@ void Gate::DemandExpectedSigner(Report* report) const {
             expected + ", and the JAR signature is by " + DigestsText(jar)});
   }
   std::set<std::string> told;
+  const auto demand = [&](const CertificateFacts& signer, const std::string& what) {
+    if (IsOneOf(options_.signers, signer) || AreSameSigner(signer, jar)) return;
+    if (!told.insert(signer.sha256).second) return;
+    refuse({&cause::kSignerUnexpected, expected + ", and " + what + DigestsText(signer)});
+  };
   for (const RangeJudgement& range : report->installer.ranges) {
     for (const CertificateFacts* const signer : NewestSigners(range)) {
-      if (IsOneOf(options_.signers, *signer) || AreSameSigner(*signer, jar)) continue;
-      if (!told.insert(signer->sha256).second) continue;
-      refuse({&cause::kSignerUnexpected,
-              expected + ", and phones install it for " + DigestsText(*signer)});
+      demand(*signer, "phones install it for ");
     }
+  }
+  if (IsJudged(*report)) return;
+  for (const NewerSignerFacts& signer : report->newer) {
+    demand(signer.certificate, "its " + signer.scheme + " signature names ");
   }
 }
 
 void Gate::DemandOneSigner(Report* report) {
   if (report->package_name.empty()) return;
-  const First own = {report->file, JarSigner(*report), InstalledSigners(report->installer)};
+  const First own = {report->file, JarSigner(*report), InstalledSigners(*report)};
   const auto& [place, is_first] = first_.emplace(report->package_name, own);
   if (is_first) return;
   const First& first = place->second;
@@ -139,16 +146,25 @@ std::vector<const CertificateFacts*> NewestSigners(const RangeJudgement& range) 
   return signers;
 }
 
-// The signers for whom phones install the package: those of the newest phones that take it.
-std::vector<CertificateFacts> InstalledSigners(const Judgement& judgement) {
+// The signers for whom phones install the package: those of the newest phones that take it. Where
+// the installer was not asked, those of the newest scheme that the file names.
+std::vector<CertificateFacts> InstalledSigners(const Report& report) {
   std::vector<CertificateFacts> signers;
-  for (const RangeJudgement& range : judgement.ranges) {
+  for (const RangeJudgement& range : report.installer.ranges) {
     if (!range.is_verified) continue;
     signers.clear();
     for (const CertificateFacts* const signer : NewestSigners(range)) signers.push_back(*signer);
   }
+  if (IsJudged(report)) return signers;
+  std::string newest;
+  for (const NewerSignerFacts& signer : report.newer) newest = std::max(newest, signer.scheme);
+  for (const NewerSignerFacts& signer : report.newer) {
+    if (signer.scheme == newest) signers.push_back(signer.certificate);
+  }
   return signers;
 }
+
+bool IsJudged(const Report& report) { return report.installer.state == Judgement::State::kJudged; }
 
 // A signature with such a key does not prove who signed.
 bool HasForgeableKey(const Report& report) {
