@@ -14,7 +14,8 @@ using Reasons = std::vector<Reason>;
 void WarnOfTwoFaces(const PackageFacts& facts, const Report& report, Reasons* warnings);
 void WarnOfSigners(const PackageFacts& facts, const Report& report, Reasons* warnings);
 void WarnOfWeakDigests(const PackageFacts& facts, Reasons* warnings);
-void WarnOfExpiry(const JarSignatureFacts& jar, int64_t now, Reasons* warnings);
+void WarnOfExpiry(const PackageFacts& facts, int64_t now, Reasons* warnings);
+std::vector<const CertificateFacts*> Certificates(const PackageFacts& facts);
 void WarnOfOtherKeys(const PackageFacts& facts, const Report& report, Reasons* warnings);
 void WarnOfStrippedSchemes(const PackageFacts& facts, Reasons* warnings);
 void WarnOfEntries(const PackageFacts& facts, const Report& report, Reasons* warnings);
@@ -31,7 +32,7 @@ std::vector<Reason> FindWarnings(const RunRecord& run, const PackageFacts& facts
     WarnOfTwoFaces(facts, report, &warnings);
     WarnOfSigners(facts, report, &warnings);
     WarnOfWeakDigests(facts, &warnings);
-    WarnOfExpiry(facts.jar, now, &warnings);
+    WarnOfExpiry(facts, now, &warnings);
     WarnOfOtherKeys(facts, report, &warnings);
     WarnOfStrippedSchemes(facts, &warnings);
   }
@@ -83,8 +84,12 @@ void WarnOfSigners(const PackageFacts& facts, const Report& report, Reasons* war
   if (jar.key && jar.key->bits < kSafeBits) {
     warnings->push_back({&cause::kWeakKey, std::to_string(jar.key->bits)});
   }
-  const std::string subject = jar.certificate ? jar.certificate->subject : "";
-  if ((subject + ",").find("CN=Android Debug,") != std::string::npos) {
+  const std::vector<const CertificateFacts*> certificates = Certificates(facts);
+  const auto is_debug = [](const CertificateFacts* certificate) {
+    const std::string subject = ", " + certificate->subject + ",";
+    return subject.find(", CN=Android Debug,") != std::string::npos;
+  };
+  if (std::any_of(certificates.begin(), certificates.end(), is_debug)) {
     warnings->push_back({&cause::kDebugKey, ""});
   }
   if (jar.signature_files.size() > 1 || jar.block.signer_count > 1) {
@@ -99,8 +104,9 @@ void WarnOfWeakDigests(const PackageFacts& facts, Reasons* warnings) {
   };
   const JarSignatureFacts& jar = facts.jar;
   std::vector<std::string> uses;
-  if (jar.certificate && is_weak(jar.certificate->signature_algorithm)) {
-    uses.push_back("the certificate is signed with " + jar.certificate->signature_algorithm);
+  for (const CertificateFacts* const certificate : Certificates(facts)) {
+    if (!is_weak(certificate->signature_algorithm)) continue;
+    uses.push_back("the certificate is signed with " + certificate->signature_algorithm);
   }
   if (is_weak(jar.block.digest))
     uses.push_back("the signature block is made with " + jar.block.digest);
@@ -115,14 +121,29 @@ void WarnOfWeakDigests(const PackageFacts& facts, Reasons* warnings) {
   if (!uses.empty()) warnings->push_back({&cause::kWeakDigest, Joined(uses)});
 }
 
-void WarnOfExpiry(const JarSignatureFacts& jar, int64_t now, Reasons* warnings) {
-  if (!jar.certificate || !jar.certificate->not_after) return;
-  if (*jar.certificate->not_after >= now) return;
-  const time_t end = *jar.certificate->not_after;
-  struct tm parts = {};
-  char text[80] = "";
-  if (gmtime_r(&end, &parts) != nullptr) strftime(text, sizeof(text), "%F %T UTC", &parts);
-  warnings->push_back({&cause::kCertificateExpired, text});
+void WarnOfExpiry(const PackageFacts& facts, int64_t now, Reasons* warnings) {
+  for (const CertificateFacts* const certificate : Certificates(facts)) {
+    if (!certificate->not_after || *certificate->not_after >= now) continue;
+    const time_t end = *certificate->not_after;
+    struct tm parts = {};
+    char text[80] = "";
+    if (gmtime_r(&end, &parts) != nullptr) strftime(text, sizeof(text), "%F %T UTC", &parts);
+    warnings->push_back({&cause::kCertificateExpired, text});
+  }
+}
+
+// The signers' certificates of all schemes, each once. Phones know a signer by it.
+std::vector<const CertificateFacts*> Certificates(const PackageFacts& facts) {
+  std::vector<const CertificateFacts*> certificates;
+  const auto add = [&certificates](const CertificateFacts& certificate) {
+    const bool is_known = std::any_of(
+        certificates.begin(), certificates.end(),
+        [&certificate](const auto* known) { return known->sha256 == certificate.sha256; });
+    if (!is_known) certificates.push_back(&certificate);
+  };
+  if (facts.jar.certificate) add(*facts.jar.certificate);
+  for (const NewerSignerFacts& signer : facts.newer) add(signer.certificate);
+  return certificates;
 }
 
 // One warning for a scheme that has another signer than the JAR signature.
