@@ -22,10 +22,16 @@ bool BeginsWith(const std::string& path, std::string_view start) {
   return file && found == start;
 }
 
-// The file that a path leads to. Its last part need not exist.
+// The file that a path leads to. Its last part need not exist, and may be a link to a file that
+// opening it would make.
 fs::path Resolved(const std::string& path) {
+  constexpr int kMostLinks = 40;  // as for the kernel
   std::error_code error;
-  const fs::path resolved = fs::weakly_canonical(fs::absolute(path, error), error);
+  fs::path target = fs::absolute(path, error);
+  for (int i = 0; i < kMostLinks && fs::is_symlink(target, error); ++i) {
+    target = target.parent_path() / fs::read_symlink(target, error);
+  }
+  const fs::path resolved = fs::weakly_canonical(target, error);
   return error ? fs::path(path) : resolved;
 }
 
