@@ -275,6 +275,9 @@ inline constexpr Cause kDexDigest = {"dex-digest", Group::kSignature, Severity::
     ChainLink::kEntries, "`verifyData:`",
     "the manifest has no digest of classes.dex that this tool reads: SHA-1 or SHA-256",
     "Sign it with SHA-256 digests, as apksigner does."};
+inline constexpr Cause kEntryEncrypted = {"entry-encrypted", Group::kSignature, Severity::kRefused,
+    ChainLink::kEntries, "", "%s is encrypted, and no phone decrypts it",
+    "Build the package again without a password."};
 inline constexpr Cause kNoMemory = {"no-memory", Group::kSignature, Severity::kRefused,
     ChainLink::kCertificate, "`RSA could not`", "the tool had no memory left",
     "Run it again where there is more."};

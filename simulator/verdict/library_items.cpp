@@ -88,6 +88,11 @@ Reason WhyNotSigned(const Library& library, const RunRecord& run, const PackageF
   const LibraryFacts& found = library.facts;
   const auto& lost = run.not_extracted;
   if (std::find(lost.begin(), lost.end(), found.entry) != lost.end()) {
+    const bool is_encrypted =
+        std::any_of(facts.entries.begin(), facts.entries.end(), [&found](const ListedEntry& each) {
+          return each.entry.name == found.entry && each.entry.is_encrypted;
+        });
+    if (is_encrypted) return {&cause::kEntryEncrypted, found.entry};
     return {&cause::kLibraryNotExtracted, ""};
   }
   if (library.attempt != nullptr) {

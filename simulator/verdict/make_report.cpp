@@ -135,11 +135,13 @@ ItemKind KindOf(const RunRecord& run) {
 }
 
 Reason WhyJarRefused(const RunRecord& run, const PackageFacts& facts) {
+  Reason encrypted = WhyEncrypted(facts);
+  if (encrypted.detail == kAndroidManifestName) return encrypted;
   const LogLine* const line = FindError(run.opening_errors, LogMeaning::kNoAndroidManifest);
   if (line != nullptr && line->text != ErrorCodeString(ApkTools::kZipEntryNotFound)) {
     return {&cause::kAndroidManifestDamaged, ""};
   }
-  const Reason taken_for_a_jar = WhyTakenForAJar(facts);
+  Reason taken_for_a_jar = WhyTakenForAJar(facts);
   if (taken_for_a_jar.cause != nullptr) return taken_for_a_jar;
   return {&cause::kJarNotTrusted, DescribeErrno(run.verify_error.value_or(0))};
 }

@@ -30,6 +30,8 @@ std::string FirstSignatureFile(const JarSignatureFacts& jar);
 Reason WhyRefused(const RunRecord& run, const PackageFacts& facts) {
   const Lines& errors = run.opening_errors;
   const JarSignatureFacts& jar = facts.jar;
+  Reason encrypted = WhyEncrypted(facts);
+  if (encrypted.cause != nullptr) return encrypted;
   if (run.is_dex_refused) return WhyDexRefused(run.dex_why);
   for (const LogLine& line : errors) {
     const LogMeaning meaning = line.meaning;
@@ -77,6 +79,15 @@ Reason WhyTakenForAJar(const PackageFacts& facts) {
   }
   if (has_packages) return {&cause::kPackageSet, ""};
   if (!part.empty()) return {&cause::kPackageWithoutManifest, part};
+  return {};
+}
+
+Reason WhyEncrypted(const PackageFacts& facts) {
+  for (const ListedEntry& each : facts.entries) {
+    const std::string& name = each.entry.name;
+    const bool is_read = each.is_signature || name == kAndroidManifestName || name == "classes.dex";
+    if (is_read && each.entry.is_encrypted) return {&cause::kEntryEncrypted, name};
+  }
   return {};
 }
 

@@ -20,6 +20,10 @@ Reason WhyNotLookedAt(const RunRecord& run, const PackageFacts& facts);
 // or a set of packages, or has parts of a package. A null cause if it may be a JAR.
 Reason WhyTakenForAJar(const PackageFacts& facts);
 
+// The reason for a file that the tool refused if an entry that the tool reads is encrypted: one of
+// the JAR signature, AndroidManifest.xml or classes.dex. A null cause if none is.
+Reason WhyEncrypted(const PackageFacts& facts);
+
 // Why the kernel did not sign the file; a null cause if it did.
 Reason WhyKernelDidNotSign(const Attempt& attempt);
 
