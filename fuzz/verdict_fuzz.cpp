@@ -210,9 +210,11 @@ void JudgeShown(const Report& report) {
   PrintReport(report, Detail::kAll, Look(), all);
   const std::string head = line.str();
   Require(all.str().rfind(head, 0) == 0, "the verdict comes first");
+  const std::string why = DecisiveReason(report);
   const size_t key = head.find(", key ");
-  const std::string digest = report.key ? report.key->sha256 : "";
-  Require((key != std::string::npos) == !digest.empty(), "the key is shown if there is one");
+  const std::string digest = report.key && why.empty() ? report.key->sha256 : "";
+  Require(head.find(Printable(why, Look())) != std::string::npos, "the decisive reason is shown");
+  Require(!why.empty() || (key != std::string::npos) == !digest.empty(), "the key is shown");
   Require(digest.empty() || head.compare(key + 6, 8, digest, 0, 8) == 0, "this key is shown");
   const bool is_got = all.str().find("what the kernel got") != std::string::npos;
   Require(is_got == (report.key && report.key->was_got), "what the kernel got is called so");
