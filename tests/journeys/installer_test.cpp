@@ -176,6 +176,38 @@ TEST(Installer, AnotherSignerIsSaidInTheVerdict) {
             Lines({"SIGNED", "phones of API 27 take it, by v2", "-> 0"}));
 }
 
+// The verifier names one signer for all levels that it is asked about at once: the first key's.
+TEST(Installer, SignerForLaterPhonesAloneIsFound) {
+  EXPECT_EQ(
+      Told("later-v3"),
+      Lines({"NOT INSTALLABLE",
+             "phones of API 28 to 29 refuse it, those of API 27, API 30 and later take it: none "
+             "of its signatures is for these phones (NO_SIGNATURE_FOR_LEVELS)",
+             "-> 1"}));
+  EXPECT_EQ(Told("later-v3", {"--api", "27"}),
+            Lines({"SIGNED", "phones of API 27 take it, by v2", "-> 0"}));
+  EXPECT_EQ(Told("later-v3", {"--api", "30-"}),
+            Lines({"SIGNED, OTHER SIGNER", "phones of API 30 and later take it, by v3", "-> 0"}));
+}
+
+// Older versions of apksig do not know v3.1, and would name the first key for all phones.
+TEST(Installer, SignerOfASchemeThatTheVerifierDoesNotKnowIsNotPassedOver) {
+  const ProcessResult run = RunProcess(
+      {SimulatorPath(), "--quiet", "--installer=required", Golden("later-v31") + "/base.apk"});
+  EXPECT_NE(run.output, "");
+  EXPECT_NE(run.output.substr(0, 8), "SIGNED  ") << run.output;
+  EXPECT_EQ(Told("later-v31", {"--api", "27-32"}).front(), "SIGNED");
+}
+
+TEST(Installer, RefusalOfTheOldestPhonesIsNotHiddenByV3) {
+  EXPECT_EQ(
+      Told("without-v2"),
+      Lines({"NOT INSTALLABLE",
+             "phones of API 27 refuse it, those of API 28 and later take it: it was signed with "
+             "APK Signature Scheme v2 as well, and that signature is gone",
+             "-> 1"}));
+}
+
 TEST(Installer, RefusalOfTheToolStays) {
   EXPECT_EQ(Told("apksigner-ec"),
             Lines({"REFUSED", "phones of API 27 and later take it, by v2, v3", "-> 1"}));

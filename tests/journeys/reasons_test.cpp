@@ -394,6 +394,17 @@ TEST_F(Reason, EncryptedEntry) {
             told.end());
 }
 
+TEST_F(Reason, EncryptedEntryThatTheToolReads) {
+  for (const std::string entry : {"AndroidManifest.xml", "META-INF/MANIFEST.MF", "META-INF/CERT.SF",
+                                  "META-INF/CERT.RSA", "classes.dex"}) {
+    Do("rm -rf -- *");
+    Take("apksigner-sha256-2048");
+    Do("unzip -q base.apk " + entry + "; zip -q -P word base.apk " + entry);
+    EXPECT_EQ(Told(2)[1].substr(Told(2)[1].find("not signed")),
+              "not signed: " + entry + " is encrypted, and no phone decrypts it");
+  }
+}
+
 TEST_F(Reason, ArchivesThatAreNoPackage) {
   Take("apksigner-sha256-2048");
   Do("touch BundleConfig.pb; zip -q app.aab BundleConfig.pb; zip -q set.apks base.apk;"

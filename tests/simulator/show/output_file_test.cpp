@@ -72,6 +72,11 @@ TEST(OutputFile, IsTheSameUnderTwoNames) {
   EXPECT_TRUE(AreSame(path, link));
   EXPECT_TRUE(AreSame(path, twin));
   EXPECT_TRUE(AreSame(folder / "none", folder / "./none"));
+  const std::string dangling = folder / "dangling", other = folder / "other";
+  ASSERT_EQ(symlink("none", dangling.c_str()), 0);
+  ASSERT_EQ(symlink("dangling", other.c_str()), 0);
+  EXPECT_TRUE(AreSame(dangling, folder / "none"));
+  EXPECT_TRUE(AreSame(other, dangling));
   EXPECT_FALSE(AreSame(path, folder / "none"));
   EXPECT_FALSE(AreSame(path, ""));
   EXPECT_FALSE(AreSame("", ""));

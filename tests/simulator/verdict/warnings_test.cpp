@@ -314,6 +314,27 @@ TEST(Warnings, DigestsForWhichCollisionsAreKnown) {
                                     "signature block is made with SHA1"}));
 }
 
+// The key is the JAR signer's. The certificate is another one, and phones go by it.
+TEST(Warnings, CertificateOfANewerScheme) {
+  PackageFacts facts = Good();
+  NewerSignerFacts newer = {"v2", *facts.jar.certificate};
+  facts.newer = {newer};
+  EXPECT_EQ(Warnings(facts), Lines());
+  newer.certificate.sha256 = "other";
+  newer.certificate.subject = "C=US, CN=Android Debug";
+  newer.certificate.signature_algorithm = "SHA1withRSA";
+  newer.certificate.not_after = -1;
+  facts.newer = {newer, newer};
+  EXPECT_EQ(Warnings(facts),
+            Lines({"debug-key: ", "weak-digest: the certificate is signed with SHA1withRSA",
+                   "certificate-expired: 1969-12-31 23:59:59 UTC"}));
+  newer.certificate.subject = "O=CN=Android Debug";
+  newer.certificate.signature_algorithm = "SHA256withRSA";
+  newer.certificate.not_after = {};
+  facts.newer = {newer};
+  EXPECT_EQ(Warnings(facts), Lines());
+}
+
 // date -u -d @1000000000: 2001-09-09 01:46:40. The second that a certificate names is its last.
 TEST(Warnings, CertificateThatExpired) {
   const auto told = [](std::optional<int64_t> end, int64_t now) {
