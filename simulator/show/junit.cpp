@@ -93,6 +93,8 @@ std::string DetailText(const Report& report) {
     add(NameOf(item) + ": " + OutcomeOf(item, report.verdict), item.reason);
   }
   for (const Reason& warning : report.warnings) add("warning: " + warning.Text(), warning);
+  const std::string missing = MissingInstaller(report);
+  if (!missing.empty()) text += Printable("warning: " + missing, kXml) + "\n";
   return text;
 }
 

@@ -72,7 +72,7 @@ void Presenter::Show(const Report& report, const std::string& journal) {
   if (sarif_file_.IsWanted()) sarif_.Add(report);
   std::cout.flush();
   verdicts_.push_back(report.verdict);
-  if (report.installer.state == Judgement::State::kMissing) missing_ = report.installer.why;
+  if (missing_.empty()) missing_ = MissingInstaller(report);
   if (report.verdict == Verdict::kNotSimulated) {
     if (DecisiveItem(report)->reason.cause == &cause::kInterrupted) is_interrupted_ = true;
     Complain(kCannotSimulate, report.file + ": " + DecisiveItem(report)->reason.Text());
@@ -120,7 +120,7 @@ int Presenter::Finish(const std::vector<std::string>& files) {
   ReportUntold({files.begin() + static_cast<std::ptrdiff_t>(shown_), files.end()},
                {&cause::kInterrupted, ""});
   WriteReports();
-  if (!missing_.empty()) Complain(status_, "no phone's installer was asked: " + missing_);
+  if (!missing_.empty()) Complain(status_, missing_);
   return EndWith(status_);
 }
 

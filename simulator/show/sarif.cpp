@@ -38,15 +38,21 @@ void Sarif::Add(const Report& report) {
   for (const Reason& warning : report.warnings) {
     AddResult(*warning.cause, kWarning, warning.Text(), location);
   }
+  const std::string missing = MissingInstaller(report);
+  if (!missing.empty() && !is_installer_missing_) {
+    is_installer_missing_ = true;
+    notifications_.push_back({{"level", kWarning}, {"message", Message(missing)}});
+  }
   const ExitStatus status = StatusOf(report.verdict);
   if (status != kNotLookedAt && status != kCannotSimulate) return;
+  is_successful_ = false;
   const std::string text = WordsOf(report.verdict).word + (": " + DecisiveReason(report));
   notifications_.push_back(
       {{"level", kError}, {"message", Message(text)}, {"locations", Json::array({location})}});
 }
 
 std::string Sarif::Log() const {
-  Json invocation = {{"executionSuccessful", notifications_.empty()}};
+  Json invocation = {{"executionSuccessful", is_successful_}};
   if (!notifications_.empty()) invocation["toolExecutionNotifications"] = notifications_;
   const Json driver = {
       {"name", "apktoolkit-sim"}, {"version", APKTOOLKIT_VERSION}, {"rules", rules_}};

@@ -48,6 +48,8 @@ class Sarif {
   Json artifacts_ = Json::array();
   Json results_ = Json::array();
   Json notifications_ = Json::array();
+  bool is_successful_ = true;          // each file was judged
+  bool is_installer_missing_ = false;  // said once for the whole run
 };
 
 // The file as an URI reference (RFC 3986 §4.1): of an absolute path the whole URI.

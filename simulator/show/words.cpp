@@ -61,6 +61,11 @@ std::vector<std::string> HeadFacts(const Report& report, const char* ellipsis) {
   return facts;
 }
 
+std::string MissingInstaller(const Report& report) {
+  const bool is_missing = report.installer.state == Judgement::State::kMissing;
+  return is_missing ? "no phone's installer was asked: " + report.installer.why : "";
+}
+
 std::string DecisiveReason(const Report& report) {
   const Item* const item = DecisiveItem(report);
   if (item == nullptr) return {};

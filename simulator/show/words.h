@@ -48,6 +48,9 @@ std::vector<std::string> AlarmFacts(const Report& report);
 // The reason of the item that decides the verdict; empty if nothing was refused.
 std::string DecisiveReason(const Report& report);
 
+// Tells that the phones' installer was not asked because its verifier is missing; empty otherwise.
+std::string MissingInstaller(const Report& report);
+
 // The facts after the file's name in the verdict's line: the decisive reason or, if nothing was
 // refused, the owner; then an unexpected signer, the alarms, and the number of all warnings.
 std::vector<std::string> HeadFacts(const Report& report, const char* ellipsis);

@@ -80,6 +80,15 @@ TEST(Junit, HasACaseForEachFileAndCountsThem) {
           "is another signer.'\n");
 }
 
+TEST(Junit, SaysThatTheInstallerWasNotAsked) {
+  Report unasked = Good("a.apk");
+  unasked.installer = {Judgement::State::kMissing, "there is no java", {}};
+  EXPECT_NE(ReadByPython(XmlOf({unasked}))
+                .find("system-out [] \"warning: no phone's installer was asked: there is no java"),
+            std::string::npos)
+      << XmlOf({unasked});
+}
+
 TEST(Junit, OnlyWhatEndsWithStatusZeroPasses) {
   constexpr struct {
     Verdict verdict;

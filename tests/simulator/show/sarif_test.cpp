@@ -115,6 +115,12 @@ TEST(Sarif, FileThatWasNotJudgedIsAnErrorAndTheRunWasNotSuccessful) {
     EXPECT_EQ(invocation["toolExecutionNotifications"][0]["level"], "error");
     EXPECT_FALSE(log["runs"][0]["artifacts"][0].contains("hashes"));
   }
+  Report unasked = Good("a.apk");
+  unasked.installer = {Judgement::State::kMissing, "there is no java", {}};
+  EXPECT_EQ(LogOf({unasked, unasked})["runs"][0]["invocations"],
+            Json::parse(R"([{"executionSuccessful": true, "toolExecutionNotifications": [
+                {"level": "warning", "message":
+                    {"text": "no phone's installer was asked: there is no java"}}]}])"));
   Report refused = Good("a.apk");
   refused.verdict = Verdict::kRefused;
   refused.items = {RefusedFor(&cause::kToolError, "a")};
