@@ -144,7 +144,8 @@ def simulate(run, directory, build, out):
     """Runs it in the simulated phone. The journal goes to OUT/NAME.journal."""
     if run.before:
         subprocess.run(run.before, shell=True, cwd=directory, check=True)
-    command = [build / "bin/apktoolkit-sim", "--install=no", "--json", "--state", out / "state", *run.options]
+    command = [build / "bin/apktoolkit-sim", "--install=no", "--installer=off", "--json",
+               "--state", out / "state", *run.options]
     command += ["--verify"] if run.program == VERIFY else ["--tool", build / "bin" / run.program]
     command.append(directory / run.file)
     if run.mount == "ro":
