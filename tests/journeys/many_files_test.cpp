@@ -126,7 +126,7 @@ TEST_F(ManyFiles, TwoRunsOverTheSameFileTellTheSame) {
       "for run in 1 2; do sim --journal $run.journal --html $run.html good/base.apk; "
       "\"$SIM\" --installer=off --verbose good/base.apk >$run.text; "
       "sed -i 's/\"pid\":[1-9][0-9]*/\"pid\":N/' $run.journal; "
-      "sed -i -E 's/20[0-9-]{8}[T ][0-9:]{8}(Z| UTC)/TIME/' $run.html; done\n";
+      "sed -i -E 's/20[0-9-]{8}[T ][0-9:]{8}(Z| UTC)/TIME/g' $run.html; done\n";
   const ProcessResult run =
       Do(both + "cmp 1.journal 2.journal && cmp 1.html 2.html && cmp 1.text 2.text");
   EXPECT_EQ(run.status, 0) << run.output << run.errors;
