@@ -64,7 +64,7 @@ Said ByTool(const Report& report) {
   std::vector<std::string> why;
   for (const Item& item : report.items) {
     if (item.state == ItemState::kDone) ++done;
-    if (item.state != ItemState::kRefused || item.kind == ItemKind::kInstaller) continue;
+    if (item.state != ItemState::kRefused || !IsByTool(item)) continue;
     why.push_back(NameOf(item) + ": " + item.reason.Text());
   }
   const bool is_signed = done > 0;

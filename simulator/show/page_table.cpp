@@ -1,6 +1,7 @@
 #include "simulator/show/page_table.h"
 
 #include <algorithm>
+#include <iterator>
 #include <string_view>
 
 #include "simulator/show/page_fields.h"
@@ -17,9 +18,12 @@ using kainjow::mustache::object;
 // From the worst to the best: of the first nothing is known, and of the last nothing is wrong.
 constexpr Verdict kWorstFirst[] = {
     Verdict::kNotSimulated,  Verdict::kNotLookedAt,    Verdict::kRefused,
-    Verdict::kNotTrustedJar, Verdict::kNotInstallable, Verdict::kPartlySigned,
-    Verdict::kOtherSigner,   Verdict::kSigned,         Verdict::kTrustedJar,
+    Verdict::kNotTrustedJar, Verdict::kNotInstallable, Verdict::kNotAccepted,
+    Verdict::kPartlySigned,  Verdict::kOtherSigner,    Verdict::kSigned,
+    Verdict::kTrustedJar,
 };
+static_assert(std::size(kWorstFirst) == static_cast<size_t>(Verdict::kNotSimulated) + 1,
+              "each verdict has its rank; kNotSimulated is the last one");
 
 size_t RankOf(Verdict verdict);
 std::string ReasonText(const Report& report);

@@ -134,9 +134,7 @@ std::string OutcomeOf(const Item& item, Verdict verdict) {
     return "signed";
   }
   if (item.state != ItemState::kRefused) return "nothing to sign: " + reason;
-  if (item.kind == ItemKind::kTool || item.kind == ItemKind::kEntries ||
-      item.kind == ItemKind::kInstaller || item.kind == ItemKind::kSigner ||
-      item.kind == ItemKind::kWarnings) {
+  if (item.kind == ItemKind::kTool || item.kind == ItemKind::kEntries || !IsByTool(item)) {
     return reason;
   }
   if (item.kind == ItemKind::kKey) return "not registered: " + reason;

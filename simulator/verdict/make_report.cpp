@@ -94,6 +94,11 @@ const Item* DecisiveItem(const Report& report) {
   return nullptr;
 }
 
+bool IsByTool(const Item& item) {
+  return item.kind != ItemKind::kInstaller && item.kind != ItemKind::kSigner &&
+         item.kind != ItemKind::kWarnings;
+}
+
 ExitStatus StatusOf(Verdict verdict) {
   constexpr ExitStatus kStatuses[] = {kAllSigned,   kAllSigned,     kAllSigned,   kSomeRefused,
                                       kSomeRefused, kSomeRefused,   kSomeRefused, kSomeRefused,
@@ -195,7 +200,7 @@ void AddToolItems(const RunRecord& run, const JudgeOptions& options, std::vector
 // By what the tool did alone. The first item is the file itself.
 Verdict Judge(const std::vector<Item>& items) {
   const auto is_refused = [](const Item& item) {
-    return item.state == ItemState::kRefused && item.kind != ItemKind::kInstaller;
+    return item.state == ItemState::kRefused && IsByTool(item);
   };
   const auto is_signed = [](const Item& item) {
     return item.state == ItemState::kDone && item.kind != ItemKind::kKey;

@@ -133,6 +133,9 @@ const Item* DecisiveItem(const Report& report);
 // JAR's; null if all are the JAR's. Reads only the signer and the key of the report.
 const CertificateFacts* OtherSigner(const Judgement& judgement, const Report& report);
 
+// True for an item of the tool's own run. The others are the installer's and the command line's.
+bool IsByTool(const Item& item);
+
 // The exit status for a verdict.
 ExitStatus StatusOf(Verdict verdict);
 

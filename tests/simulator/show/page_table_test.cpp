@@ -53,12 +53,12 @@ TEST(PageTable, HasTheWorstFirst) {
                Example("c", Verdict::kOtherSigner), Example("d", Verdict::kPartlySigned),
                Example("e", Verdict::kNotInstallable), Example("f", Verdict::kRefused),
                Example("g", Verdict::kNotTrustedJar), Example("h", Verdict::kNotLookedAt),
-               Example("i", Verdict::kNotSimulated)})) {
+               Example("i", Verdict::kNotSimulated), Example("j", Verdict::kNotAccepted)})) {
     verdicts.push_back(row.substr(0, row.find("||")));
   }
   EXPECT_EQ(verdicts, (Lines{"NOT SIMULATED|i", "NOT LOOKED AT|h", "REFUSED|f", "NOT TRUSTED JAR|g",
-                             "NOT INSTALLABLE|e", "PARTLY SIGNED|d", "SIGNED, OTHER SIGNER|c",
-                             "SIGNED|b", "TRUSTED JAR|a"}));
+                             "NOT INSTALLABLE|e", "NOT ACCEPTED|j", "PARTLY SIGNED|d",
+                             "SIGNED, OTHER SIGNER|c", "SIGNED|b", "TRUSTED JAR|a"}));
 }
 
 TEST(PageTable, HasMoreWarningsFirstAndElseTheOrderOfTheCommandLine) {

@@ -376,6 +376,24 @@ TEST(Page, SaysWhereTheInstallerWasNotAskedOrGaveUp) {
   EXPECT_TRUE(Has(page, "</span> signs a part of it</td>"));
 }
 
+// The command line's demands are not the tool's.
+TEST(Page, ToolSignsAPackageThatTheGateRefuses) {
+  Report report = Example(Verdict::kNotAccepted);
+  report.chain = {{"key", LinkState::kHolds, ""}};
+  report.items = {Library("lib/arm/a.so", nullptr),
+                  {ItemKind::kSigner,
+                   "signer",
+                   "",
+                   ItemState::kRefused,
+                   {&cause::kSignerUnexpected, "another"}},
+                  {ItemKind::kWarnings,
+                   "warnings",
+                   "",
+                   ItemState::kRefused,
+                   {&cause::kWarningsRefused, "one"}}};
+  EXPECT_TRUE(Has(PageOf(report), "</span> signs it</td>"));
+}
+
 // A name of an option, and its value, stay in one piece; nothing of the text is lost.
 TEST(Page, KeepsTheNamesOfOptionsWhole) {
   Report report = Example(Verdict::kSigned);
