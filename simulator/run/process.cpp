@@ -34,7 +34,7 @@ bool KeepStandardStreams() {
 void CatchInterruptions() {
   struct sigaction action = {};
   action.sa_handler = Catch;
-  for (const int signal : {SIGINT, SIGTERM, SIGHUP}) {
+  for (const int signal : {SIGINT, SIGTERM, SIGHUP, SIGPIPE}) {
     struct sigaction before = {};
     sigaction(signal, nullptr, &before);
     if (before.sa_handler != SIG_IGN) sigaction(signal, &action, nullptr);

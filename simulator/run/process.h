@@ -11,8 +11,8 @@ namespace simulator {
 // process is discarded. Call it before anything is printed.
 bool KeepStandardStreams();
 
-// After this call, an interruption from the keyboard or a request to end does not end the process
-// before it has cleaned up.
+// After this call, an interruption from the keyboard, a request to end, or an output that nobody
+// reads any more does not end the process before it has cleaned up.
 void CatchInterruptions();
 bool IsInterrupted();
 // If a signal was caught, ends the process by that signal.

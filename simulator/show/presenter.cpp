@@ -7,6 +7,7 @@
 #include <iostream>
 
 #include "simulator/phone/journal.h"
+#include "simulator/run/process.h"
 #include "simulator/show/verdict_event.h"
 #include "simulator/show/words.h"
 #include "simulator/verdict/make_report.h"
@@ -175,7 +176,8 @@ int Complain(int status, const std::string& message) {
 
 int EndWith(int status) {
   std::cout.flush();
-  if (std::cout) return status;
+  // If the reader ended, the process ends by the signal for that, as other programs do.
+  if (std::cout || IsInterrupted()) return status;
   return Complain(std::max<int>(status, kCannotSimulate), "cannot write to standard output");
 }
 

@@ -142,6 +142,23 @@ TEST(Interruption, EndsTheToolAndTheSimulatorByTheSignal) {
   }
 }
 
+// The reader takes one byte and ends. By then the large packages are being laid out.
+TEST(Interruption, ByAReaderThatEndsLeavesNothingBehind) {
+  const TempDir directory, temporary;
+  PackageOptions large;
+  large.entries.push_back({"lib/arm64-v8a/liba.so", Bytes(8 << 20, 'a')});
+  MakePackage().WriteTo(directory / "small.apk");
+  MakePackage(large).WriteTo(directory / "large.apk");
+  Lines words = {"bash", "-c", "\"$@\" | head -c 1; echo \" ${PIPESTATUS[0]}\"", "bash", "env",
+                 "TMPDIR=" + temporary.path(), SimulatorPath(), "--quiet", "--installer=off",
+                 "--install", "--jobs", "8", directory / "small.apk"};
+  words.insert(words.end(), 7, directory / "large.apk");
+  const ProcessResult result = RunProcess(words);
+  EXPECT_EQ(result.output, "S " + std::to_string(128 + SIGPIPE) + "\n");
+  EXPECT_EQ(result.errors.find("cannot write"), std::string::npos) << result.errors;
+  EXPECT_TRUE(std::filesystem::is_empty(temporary.path()));
+}
+
 // As of what nohup starts.
 TEST(Interruption, IsNoneByASignalThatTheCallerIgnores) {
   const Probe slow({"sign 3 0000", "pid", "sleep 1"});
