@@ -1,5 +1,7 @@
 #include "simulator/show/sarif.h"
 
+#include <algorithm>
+
 #include "simulator/phone/text.h"
 #include "simulator/show/terminal.h"
 #include "simulator/show/words.h"
@@ -13,6 +15,12 @@ constexpr char kSchema[] =
 constexpr char kError[] = "error";
 constexpr char kWarning[] = "warning";
 constexpr int kIndent = 2;
+
+bool IsRefused(const Item& item) {
+  return item.state == ItemState::kRefused && item.reason.cause != nullptr;
+}
+
+bool Follows(const Item& item) { return item.reason.cause->severity == Severity::kFollows; }
 
 // {"text": …}, for those members that are messages.
 nlohmann::ordered_json Message(const std::string& text) {
@@ -30,8 +38,12 @@ void Sarif::Add(const Report& report) {
   const size_t index = AddArtifact(report);
   const Json location = {{"physicalLocation",
                           {{"artifactLocation", {{"uri", UriOf(report.file)}, {"index", index}}}}}};
+  // Of refusals that follow from another one there are no results: that one says what to fix.
+  const bool has_origin =
+      std::any_of(report.items.begin(), report.items.end(),
+                  [](const Item& item) { return IsRefused(item) && !Follows(item); });
   for (const Item& item : report.items) {
-    if (item.state != ItemState::kRefused || item.reason.cause == nullptr) continue;
+    if (!IsRefused(item) || (has_origin && Follows(item))) continue;
     const std::string text = NameOf(item) + ": " + OutcomeOf(item, report.verdict);
     AddResult(*item.reason.cause, kError, text, location);
   }

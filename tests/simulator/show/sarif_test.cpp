@@ -99,6 +99,16 @@ TEST(Sarif, RulesAndFilesStandOnce) {
   EXPECT_EQ(ResultsOf(log), Lines(4, "error tool-error b.apk"));
 }
 
+TEST(Sarif, RefusalThatFollowsFromAnotherIsNoResultOfItsOwn) {
+  Report refused = Good("b.apk");
+  refused.verdict = Verdict::kRefused;
+  refused.items = {RefusedFor(&cause::kPackageRefused, ""), RefusedFor(&cause::kToolError, "a")};
+  EXPECT_EQ(ResultsOf(LogOf({refused})), Lines({"error tool-error b.apk"}));
+  // A refused file always has a result.
+  refused.items.pop_back();
+  EXPECT_EQ(ResultsOf(LogOf({refused})), Lines({"error package-refused b.apk"}));
+}
+
 // A reader that counts results finds an error, and a reader that looks at the run finds that it
 // failed.
 TEST(Sarif, FileThatWasNotJudgedIsAnErrorAndTheRunWasNotSuccessful) {
