@@ -279,12 +279,18 @@ void AddOutput(CLI::App* app, Options* options) {
   app->add_flag("--json", options->show.json, "Print the journal, one JSON object a line");
   app->add_option("--journal", options->show.journal, "Write the journal to FILE; - is like --json")
       ->type_name("FILE");
-  app->add_option("--junit", options->show.junit, "Write test results to FILE, in JUnit format")
-      ->type_name("FILE");
-  app->add_option("--sarif", options->show.sarif, "Write results to FILE, as a SARIF 2.1.0 log")
-      ->type_name("FILE");
-  app->add_option("--html", options->show.html, "Write everything to FILE, a page for browsers")
-      ->type_name("FILE");
+  // Standard output has the verdicts, which would make any of these documents malformed.
+  const auto is_no_stream = [](const std::string& path) {
+    return path == "-" ? "it is not written to standard output (a file of that name: ./-)" : "";
+  };
+  const auto document = [&](const char* name, std::string* path, const char* description) {
+    app->add_option(name, *path, description)
+        ->type_name("FILE")
+        ->check(CLI::Validator(is_no_stream, ""));
+  };
+  document("--junit", &options->show.junit, "Write test results to FILE, in JUnit format");
+  document("--sarif", &options->show.sarif, "Write results to FILE, as a SARIF 2.1.0 log");
+  document("--html", &options->show.html, "Write everything to FILE, a page for browsers");
 }
 
 void AddRun(CLI::App* app, Options* options, std::string* runner) {

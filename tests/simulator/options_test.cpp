@@ -211,6 +211,9 @@ TEST(Options, MistakesAreReportedWithStatusTwo) {
                                        {"--verify", "--signer", std::string(64, 'a'), "a.apk"},
                                        {"--verify", "--junit", "/nowhere/j", "a.apk"},
                                        {"--verify", "--sarif", "/nowhere/s", "a.apk"},
+                                       {"--junit", "-", "a.apk"},
+                                       {"--sarif", "-", "a.apk"},
+                                       {"--html", "-", "a.apk"},
                                        {"--timeout", "0", "a.apk"},
                                        {"--timeout", "-1", "a.apk"},
                                        {"--timeout", "nan", "a.apk"},
@@ -237,6 +240,12 @@ TEST(Options, MistakesAreReportedWithStatusTwo) {
 TEST(Options, AnUnknownErrorIsNamed) {
   EXPECT_EQ(LinesOf(Told({"--sign-errno", "EWHAT", "a.apk"}).errors)[0],
             "--sign-errno: no error has the name EWHAT");
+}
+
+TEST(Options, OnlyTheJournalGoesToStandardOutput) {
+  EXPECT_EQ(LinesOf(Told({"--junit", "-", "a.apk"}).errors)[0],
+            "--junit: it is not written to standard output (a file of that name: ./-)");
+  EXPECT_TRUE(Parsed({"--journal", "-", "a.apk"}).show.json);
 }
 
 TEST(Options, FileThatLooksLikeAnOptionIsNamed) {
