@@ -68,11 +68,17 @@ TEST(Judgement, WhatDoesNotReadIsNoAnswer) {
         std::string(R"({"ranges":[1]})"), std::string(R"({"ranges":[{"first":27}]})"),
         Answer("1", kSigner, "[]"), Answer("true", "1", "[]"), Answer("true", "[1]", "[]"),
         Answer("true", R"([{"scheme":"v2","certificate":"zz"}])", "[]"),
-        Answer("true", R"([{"scheme":"v2","certificate":"3000"}])", "[]"),
-        Answer("false", "[]", "1"), Answer("false", "[]", "[1]"),
+        Answer("true", R"([{"scheme":"v2","certificate":""}])", "[]"), Answer("false", "[]", "1"),
+        Answer("false", "[]", "[1]"),
         Answer("false", "[]", R"([{"issue":"A","parameters":[1],"text":""}])")}) {
     EXPECT_EQ(WhyNone(answer), "its answer is malformed") << answer;
   }
+}
+
+// Java reads some certificates that the phone's crypto library refuses.
+TEST(Judgement, SignerWhoseCertificateIsNotReadIsNoAnswer) {
+  EXPECT_EQ(WhyNone(Answer("true", R"([{"scheme":"v2","certificate":"3000"}])", "[]")),
+            "the crypto library does not read the certificate of the v2 signer");
 }
 
 // Otherwise a package could be installable with errors, or for nobody.
