@@ -405,6 +405,17 @@ TEST_F(Reason, EncryptedEntryThatTheToolReads) {
   }
 }
 
+// The installation leaves it out, and the tool cannot read it either.
+TEST_F(Reason, EncryptedLibraryOfALonelyPackage) {
+  Take("apksigner-sha256-2048");
+  Do("rm -r lib; unzip -q base.apk 'lib/*'; zip -q -P word base.apk lib/arm64-v8a/*; rm -r lib");
+  EXPECT_EQ(Told(4, {"--install"}),
+            Lines({"PARTLY SIGNED  base.apk", kSigned,
+                   "  ✗ lib/arm64/libvault.so  not signed: lib/arm64-v8a/libvault.so is encrypted, "
+                   "and no phone decrypts it",
+                   "      Build the package again without a password.", "-> 1"}));
+}
+
 TEST_F(Reason, ArchivesThatAreNoPackage) {
   Take("apksigner-sha256-2048");
   Do("touch BundleConfig.pb; zip -q app.aab BundleConfig.pb; zip -q set.apks base.apk;"
