@@ -1,9 +1,10 @@
-// The entries of a zip archive, by the platform's own zip library and the tool's way to it: the
-// same entries, in the same order. Nobody vouches for the file, so each reading has a bound. Log
-// messages of the library and of the tool's code are dropped here.
+// The entries of a zip archive. They are read with the platform's own zip library and with the
+// tool's code, so they are the entries that the tool sees, in the same order. The file is not
+// trusted, so each reading has a limit. Log messages of the library and of the tool's code are
+// dropped here.
 //
-// The library maps a part of the file into memory. Should the file become shorter meanwhile, the
-// missing part reads as zeros while an Archive lives, and HasShrunk() tells.
+// The library maps a part of the file into memory. If the file becomes shorter while an Archive
+// exists, the missing part reads as zeros, and HasShrunk() returns true.
 #pragma once
 
 #include <ziparchive/zip_archive.h>
@@ -22,7 +23,7 @@ namespace simulator {
 
 inline constexpr char kAndroidManifestName[] = "AndroidManifest.xml";
 
-// How the names of entries of a kind begin and end.
+// The prefix and the suffix of the names of one kind of entries.
 struct EntryNames {
   const char* prefix;
   const char* suffix;
@@ -36,7 +37,7 @@ inline constexpr EntryNames kAllNames = {"", ""};
 inline constexpr EntryNames kLibraryNames = {"lib/", ".so"};
 inline constexpr EntryNames kSignatureFileNames = {"META-INF/", ".SF"};
 
-// Entries of a kind, in the order in which the tool meets them.
+// The entries of one kind, in the order in which the tool meets them.
 struct ArchiveWalk {
   std::vector<std::string> names;  // of all but the damaged ones
   // How many of them the tool meets. Its walk ends at the first entry that is damaged.
@@ -45,16 +46,17 @@ struct ArchiveWalk {
 
 class Archive {
  public:
-  // Longer entries are not read to explain anything, in bytes.
+  // In bytes: Read() refuses longer entries.
   static constexpr uint32_t kLongestRead = 64 << 20;
 
-  // Longer entries are not compared with the manifest, in bytes.
+  // In bytes: ReadToCompare() refuses longer entries.
   static constexpr uint32_t kLongestCompared = 512 << 20;
 
   enum class ReadResult { kRead, kMissing, kDamaged, kTooLong };
 
-  // Opens the file that is open as `fd` and stays so as long as this object lives. `result` is the
-  // library's code, 0 for success; without that nothing may be called. One thread uses the object.
+  // Opens the archive behind `fd`. The caller owns `fd` and keeps it open while this object exists.
+  // `result` is the library's code, 0 for success. If it is not 0, no other function may be called.
+  // Only one thread may use the object.
   Archive(int fd, int32_t* result);
   ~Archive();
   Archive(const Archive&) = delete;
@@ -64,15 +66,16 @@ class Archive {
   std::vector<ArchiveEntry> Entries() const;
   ArchiveWalk Walk(const EntryNames& names) const;
 
-  // Whether there is an entry of this name, be it one that cannot be extracted.
+  // True if the archive has an entry with this name, even if it cannot be extracted.
   bool Has(const std::string& name) const;
-  // The whole entry as the tool extracts it. `content` is changed by kRead alone.
+  // Extracts the whole entry as the tool does. Changes `content` only if the result is kRead.
   ReadResult Read(const std::string& name, std::vector<uint8_t>* content);
-  // The same for longer ones, up to kLongestCompared; too_long() does not name them.
+  // The same for entries of up to kLongestCompared bytes. Does not add to too_long().
   ReadResult ReadToCompare(const std::string& name, std::vector<uint8_t>* content) const;
-  // Those that were too long to be read so far.
+  // The names of the entries that Read() has refused so far, because they are too long.
   const std::vector<std::string>& too_long() const { return too_long_; }
-  // The entry, part by part, until `take` answers false. False when it did not come to its end.
+  // Passes the entry to `take`, part by part, until `take` returns false. Returns false if it did
+  // not reach the entry's end.
   bool Stream(const std::string& name,
               const std::function<bool(std::string_view part)>& take) const;
 

@@ -12,10 +12,10 @@ constexpr std::string_view kMagic = "APK Sig Block 42";
 constexpr size_t kSizeField = 8;
 constexpr size_t kFooter = kSizeField + kMagic.size();
 
-// More signers than this in one block are not looked at; phones take ten.
+// A block with more signers counts as damaged here. Phones accept at most ten.
 constexpr size_t kMostSigners = 16;
 
-// The schemes that are known here, by the number of their pair in the block.
+// The known schemes. `id` is the number of the scheme's pair in the block.
 constexpr struct {
   uint32_t id;
   const char* name;
@@ -28,8 +28,8 @@ bool TakePrefixed(CBS* bytes, CBS* part);
 
 }  // namespace
 
-// size, pairs, size again, magic; each size counts all but the first size field. Where the two
-// sizes differ, the platform finds no block.
+// A block is its size, the pairs, the size again, and the magic. Each size counts all bytes after
+// the first size field. If the two sizes differ, the platform finds no block.
 std::string ReadSigningBlock(int fd, const ArchiveEnd& end, bool* is_too_large) {
   *is_too_large = false;
   if (end.directory_offset < kSizeField + kFooter) return {};
@@ -79,7 +79,7 @@ const char* SchemeOf(uint32_t id) {
   return nullptr;
 }
 
-// The signers of one scheme. The platform wants one at least.
+// Reads the signers of one scheme. The platform requires at least one.
 bool ReadSigners(const char* scheme, CBS value, std::vector<NewerSigner>* signers) {
   CBS sequence, signer, certificate;
   if (!TakePrefixed(&value, &sequence) || CBS_len(&sequence) == 0) return false;
@@ -91,14 +91,15 @@ bool ReadSigners(const char* scheme, CBS value, std::vector<NewerSigner>* signer
   return true;
 }
 
-// All schemes begin alike: the signed data, which begins with digests and certificates.
+// A signer begins with its signed data in every scheme. The signed data begins with the digests and
+// the certificates. Takes the first certificate.
 bool ReadCertificate(CBS signer, CBS* certificate) {
   CBS signed_data, digests, certificates;
   return TakePrefixed(&signer, &signed_data) && TakePrefixed(&signed_data, &digests) &&
          TakePrefixed(&signed_data, &certificates) && TakePrefixed(&certificates, certificate);
 }
 
-// So many bytes as the number before them says.
+// Takes a part that has its length in front of it, in bytes: 4 bytes, little-endian.
 bool TakePrefixed(CBS* bytes, CBS* part) {
   uint32_t size = 0;
   return CBS_get_u32le(bytes, &size) && CBS_get_bytes(bytes, part, size);

@@ -1,7 +1,6 @@
-// The tool's standard output, as events among the others: `stdout` becomes a stream of complete
-// lines that are recorded and then written to the descriptor that they were meant for. On a phone,
-// nobody sees when the bytes of a line leave the process; here each line has its place in the
-// journal.
+// Records the tool's standard output as events. `stdout` becomes a line-buffered stream. It records
+// each line in the journal, in its place among the other events, and then writes the line to
+// descriptor 1.
 #include <unistd.h>
 
 #include <cstdio>
@@ -16,7 +15,7 @@ namespace {
 ssize_t Print(void*, const char* bytes, size_t size) {
   Record(Event("stdout").Text("text", std::string_view(bytes, size)));
   const ssize_t written = write(STDOUT_FILENO, bytes, size);
-  return written < 0 ? 0 : written;  // 0 is how such a stream is told of a failure
+  return written < 0 ? 0 : written;  // fopencookie(3): 0 reports a failure
 }
 
 __attribute__((constructor)) void ReplaceStandardOutput() {
@@ -28,7 +27,7 @@ __attribute__((constructor)) void ReplaceStandardOutput() {
   stdout = stream;
 }
 
-// The C library would do the same a little later, but an end of the process may come between.
+// The C library flushes `stdout` a little later, but the process may end before that.
 __attribute__((destructor)) void FlushStandardOutput() { fflush(stdout); }
 
 }  // namespace

@@ -1,5 +1,5 @@
-// The page's table of files: the worst first, with a choice of what is shown. The directory that
-// all of them lie in is told once.
+// The page's table of files, the worst first. The reader can choose which files it shows. The
+// directory that all files have in common is shown once, in the caption.
 #pragma once
 
 #include <kainjow/mustache.hpp>
@@ -35,8 +35,8 @@ class PageTable {
   std::vector<Row> rows_;
 };
 
-// The directory that all of these lie in by their names, with its "/" at the end; empty if they
-// share no directory but "/".
+// The deepest directory that all these paths begin with, with its "/" at the end. Empty if that is
+// only "/", or if there is none.
 std::string CommonDirectory(const std::vector<std::string>& files);
 
 }  // namespace simulator

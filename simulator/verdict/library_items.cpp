@@ -1,4 +1,4 @@
-// A package's native libraries.
+// The items for a package's native libraries.
 #include <algorithm>
 #include <cerrno>
 #include <cstdio>
@@ -9,7 +9,7 @@ namespace simulator {
 
 namespace {
 
-// A library of the package, and what the tool made of it; null when it did not say.
+// A library of the package. `attempt` is the tool's attempt to sign it; null if the log has none.
 struct Library {
   LibraryFacts facts;
   const Attempt* attempt = nullptr;
@@ -26,7 +26,7 @@ Reason WhyNotThere(const LibraryFacts& library, const RunRecord& run, const Pack
 void AddLibraryItems(const RunRecord& run, const PackageFacts& facts, const JudgeOptions& options,
                      std::vector<Item>* items) {
   const bool is_walked = run.own || !run.libraries.empty();
-  // A JAR's entries are nobody's libraries; what the tool took up is told of in any case.
+  // The entries of a plain JAR are not libraries. But each attempt of the tool gets its item.
   const bool is_package = items->front().kind == ItemKind::kPackage;
   for (const Library& library :
        MatchAttempts(run, is_package ? facts.libraries : std::vector<LibraryFacts>())) {
@@ -36,7 +36,7 @@ void AddLibraryItems(const RunRecord& run, const PackageFacts& facts, const Judg
     Item item = {ItemKind::kLibrary, name, "", ItemState::kDone, {}};
     if (reason.cause != nullptr) item = NotDone(ItemKind::kLibrary, name, reason, options);
     item.entry = found.entry;
-    // The tool hands a library to the kernel only after its bytes matched.
+    // The tool asks the kernel to sign a library only after its bytes matched the manifest.
     item.is_verified =
         library.attempt != nullptr && library.attempt->outcome != Attempt::Outcome::kNotVerified;
     items->push_back(item);
@@ -50,7 +50,7 @@ Reason WhyKernelDidNotSign(const Attempt& attempt) {
   if (attempt.outcome != Attempt::Outcome::kNotAsked) return {};
   if (!attempt.integrity) return {&cause::kIntegrityMissing, ""};
   unsigned value = 0;
-  // Read as the tool reads it.
+  // The tool reads the value in the same way.
   if (sscanf(attempt.integrity->c_str(), "%x", &value) != 1) {
     return {&cause::kIntegrityUnreadable, *attempt.integrity};
   }
@@ -59,8 +59,9 @@ Reason WhyKernelDidNotSign(const Attempt& attempt) {
 
 namespace {
 
-// The tool takes the libraries up in the order of the archive, which is known from the file. Where
-// that does not fit what it did, the paths that it named are all there is to go by.
+// Pairs each library with its attempt. The tool handles the libraries in the order of the archive,
+// and `present` has that order. If there are more attempts than libraries, the pairs cannot be
+// right. The result then has one library for each attempt, known only by its path.
 std::vector<Library> MatchAttempts(const RunRecord& run, const std::vector<LibraryFacts>& present) {
   std::vector<Library> libraries;
   auto attempt = run.libraries.begin();
@@ -82,7 +83,7 @@ std::vector<Library> MatchAttempts(const RunRecord& run, const std::vector<Libra
   return libraries;
 }
 
-// A null cause when it was signed.
+// A null cause if the library was signed.
 Reason WhyNotSigned(const Library& library, const RunRecord& run, const PackageFacts& facts,
                     bool is_walked) {
   const LibraryFacts& found = library.facts;
@@ -125,7 +126,8 @@ Reason WhyNotVerified(const Library& library, const RunRecord& run, const Packag
   return {is_changed_inside ? &cause::kLibraryChangedInside : &cause::kLibraryChanged, ""};
 }
 
-// The tool does not log why a file does not open; the file system still knew.
+// The tool does not log why a file could not be opened. `library.error` is the errno of
+// opening it again.
 Reason WhyNotThere(const LibraryFacts& library, const RunRecord& run, const PackageFacts& facts) {
   const int error = library.error;
   if (error == EACCES || error == EPERM) return {&cause::kLibraryNoPermission, ""};
@@ -135,7 +137,7 @@ Reason WhyNotThere(const LibraryFacts& library, const RunRecord& run, const Pack
     return {&cause::kLibraryNotOpened, DescribeErrno(error)};
   }
   if (facts.manifest.extracts_libraries == false) return {&cause::kLibraryInPackage, ""};
-  // lib/arm64/NAME is where an installer puts it.
+  // Installers use only lib/ABI/NAME, such as lib/arm64/NAME.
   if (std::count(library.place.begin(), library.place.end(), '/') > 2) {
     return {&cause::kLibraryInSubdirectory, library.place};
   }
