@@ -14,7 +14,8 @@ using kainjow::mustache::data;
 using kainjow::mustache::list;
 using kainjow::mustache::object;
 
-// The judgement of one of the two. Each line in its cell is cut by itself.
+// A row of the table: the judgement of the tool, or of the phones of some API levels. Each line of
+// a cell is shortened separately.
 struct Said {
   std::string who;
   Mark mark;
@@ -58,7 +59,7 @@ std::vector<Said> JudgementsOf(const Report& report) {
   return all;
 }
 
-// Of the tool's own items; what the installer refuses is the installer's to say.
+// Uses only the tool's own items. ByInstaller shows the installer's refusals.
 Said ByTool(const Report& report) {
   size_t done = 0;
   std::vector<std::string> why;
@@ -70,7 +71,7 @@ Said ByTool(const Report& report) {
   const bool is_signed = done > 0;
   const char* const outcome = !is_signed    ? "signs nothing"
                               : why.empty() ? "signs it"
-                                            : "signs a part of it";
+                                            : "signs only a part of it";
   Said said = {"apktoolkit", is_signed && why.empty() ? Mark::kGood : Mark::kBad, outcome, "", {},
                why};
   if (report.signer || report.key) {
@@ -83,7 +84,7 @@ Said ByTool(const Report& report) {
 Said ByInstaller(const RangeJudgement& range) {
   Said said = {"phones of " + LevelText(range.levels),
                range.is_verified ? Mark::kGood : Mark::kBad,
-               range.is_verified ? "take it" : "refuse it",
+               range.is_verified ? "install it" : "refuse it",
                Joined(range.schemes),
                {},
                {}};
@@ -108,7 +109,7 @@ Said ByNobody(const Judgement& judgement) {
   return said;
 }
 
-// Such as "CN=Vault, RSA-2048, key 98302ce8…f64646", as the tool's signer is told.
+// The same form as for the tool's signer: "CN=Vault, RSA-2048, key 98302ce8…f64646".
 std::string SignerOf(const InstallerSigner& signer) {
   Report of_signer;
   of_signer.signer = signer.certificate;

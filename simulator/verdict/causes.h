@@ -333,8 +333,9 @@ inline constexpr Cause kLibraryInPackage = {"library-in-package", Group::kLibrar
     "Nothing to do: it is loaded from the package."};
 inline constexpr Cause kLibraryNotInstalled = {"library-not-installed", Group::kLibrary,
     Severity::kAbsent, ChainLink::kNone, "`Can't open file`",
-    "no libraries for its processor lie beside the package", "Nothing to do for "
-    "a phone of another kind. To lay out those of all processors: --install=all."};
+    "no libraries for its processor are beside the package", "Nothing to do for "
+    "a phone with another processor. To lay out the libraries of all "
+    "processors, give --install=all."};
 inline constexpr Cause kLibraryNotLaidOut = {"library-not-laid-out", Group::kLibrary,
     Severity::kNothing, ChainLink::kNone, "`Can't open file`",
     "it is for another processor than the phone's (--install=all lays out those of all)",
@@ -344,7 +345,7 @@ inline constexpr Cause kLibraryInSubdirectory = {"library-in-subdirectory", Grou
     "it is in a subdirectory of its ABI: the tool looks for %s, and installers do not put it there",
     "Build the package again with its libraries as lib/ABI/NAME."};
 inline constexpr Cause kLibraryMissing = {"library-missing", Group::kLibrary, Severity::kAbsent,
-    ChainLink::kNone, "`Can't open file`", "it does not lie beside the package, where others are",
+    ChainLink::kNone, "`Can't open file`", "it is not beside the package, but other libraries are",
     "Install the package again, unless the installer leaves it out on purpose."};
 inline constexpr Cause kLibraryOtherAbi = {"library-other-abi", Group::kLibrary, Severity::kNothing,
     ChainLink::kNone, "", "no phone of this kind installs it",
@@ -389,8 +390,8 @@ inline constexpr Cause kNotInstallable = {"not-installable", Group::kInstaller, 
     "trust it. apksigner verify --min-sdk-version 27 names every fault."};
 inline constexpr Cause kNotInstallableOnSome = {"not-installable-on-some", Group::kInstaller,
     Severity::kRefused, ChainLink::kNone, "", "phones of %s",
-    "Sign it so that all of these phones take it, as apksigner does by default. If it is only for "
-    "some of them, name those with --api."};
+    "Sign it so that all of these phones install it, as apksigner does by default. If it is only "
+    "for some of them, name those with --api."};
 inline constexpr Cause kInstallerGaveUp = {"installer-gave-up", Group::kInstaller,
     Severity::kRefused, ChainLink::kNone, "", "the installer's verifier gave up: %s", "Do not "
     "trust this package, if it is not of your making. A large one may need a larger --timeout; "
@@ -418,9 +419,10 @@ inline constexpr Cause kWarningsRefused = {"warnings-refused", Group::kGate, Sev
 
 // ---- Warnings: facts that deserve a second look, even if everything was signed.
 inline constexpr Cause kOtherKey = {"other-key", Group::kWarning, Severity::kWarning,
-    ChainLink::kNone, "", "%s is of another key than the JAR signature: phones install the package "
-    "for that key, and the kernel gets this one", "Sign it with one key for all schemes; a rotated "
-    "key reaches the newer ones alone. If it is not of your making: do not trust it."};
+    ChainLink::kNone, "", "%s is made with another key than the JAR signature: phones install the "
+    "package for that other key, but the kernel gets the JAR signature's key", "Sign all schemes "
+    "with one key. Only the newer schemes use a rotated key. If it is not of your making: do not "
+    "trust it."};
 inline constexpr Cause kSchemesStripped = {"schemes-stripped", Group::kWarning, Severity::kWarning,
     ChainLink::kNone, "", "the signature file says that the package is signed with %s as well, and "
     "it is not: phones do not install it",
@@ -488,7 +490,7 @@ inline constexpr Cause kEntriesEncrypted = {"entries-encrypted", Group::kWarning
     ChainLink::kNone, "", "%s: encrypted, and no phone decrypts it",
     "Build the package again without a password."};
 inline constexpr Cause kEntriesDamaged = {"entries-damaged", Group::kWarning, Severity::kDoubt,
-    ChainLink::kNone, "", "the archive is damaged at %s, which nobody can read",
+    ChainLink::kNone, "", "the archive is damaged and cannot be read at %s",
     "Copy or build the package again; unzip -t names the fault."};
 
 // clang-format on

@@ -146,8 +146,8 @@ std::vector<const CertificateFacts*> NewestSigners(const RangeJudgement& range) 
   return signers;
 }
 
-// The signers for whom phones install the package: those of the newest phones that take it. Where
-// the installer was not asked, those of the newest scheme that the file names.
+// The signers for whom phones install the package: those of the newest phones that install it.
+// Where the installer was not asked, those of the newest scheme that the file names.
 std::vector<CertificateFacts> InstalledSigners(const Report& report) {
   std::vector<CertificateFacts> signers;
   for (const RangeJudgement& range : report.installer.ranges) {

@@ -1,4 +1,4 @@
-// The item for the judgement of the phones' installer, beside the tool's own.
+// The item for the judgement of the phones' installer. The other items are the tool's.
 #include <algorithm>
 
 #include "simulator/verdict/parts.h"
@@ -25,8 +25,9 @@ void AddInstallerItem(const Judgement& judgement, const JudgeOptions& options,
   const std::string why = WhyRefusedByInstaller(refused->errors[0]);
   const std::string takers = LevelsText(judgement.ranges, true);
   if (takers.empty()) return add({&cause::kNotInstallable, why});
-  add({&cause::kNotInstallableOnSome, LevelsText(judgement.ranges, false) +
-                                          " refuse it, those of " + takers + " take it: " + why});
+  add({&cause::kNotInstallableOnSome, takers + " install it, but phones of " +
+                                          LevelsText(judgement.ranges, false) +
+                                          " refuse it: " + why});
 }
 
 std::string LevelText(const LevelRange& levels) {
@@ -44,10 +45,11 @@ std::string TakersText(const Judgement& judgement) {
       if (!is_known) schemes.push_back(scheme);
     }
   }
-  return "phones of " + LevelsText(judgement.ranges, true) + " take it, by " + Joined(schemes);
+  return "phones of " + LevelsText(judgement.ranges, true) + " install it, verified by " +
+         Joined(schemes);
 }
 
-// Phones verify the newest scheme that they know, and all of its signers count.
+// Phones verify only the newest scheme that they know. All signers of that scheme count.
 const CertificateFacts* OtherSigner(const Judgement& judgement, const Report& report) {
   const CertificateFacts* other = nullptr;
   for (const RangeJudgement& range : judgement.ranges) {
@@ -63,7 +65,8 @@ const CertificateFacts* OtherSigner(const Judgement& judgement, const Report& re
 
 namespace {
 
-// The levels of the phones that take the package, or of those that do not: "API 27 to 29".
+// The API levels of the phones that install the package, or of the phones that refuse it: "API 27
+// to 29".
 std::string LevelsText(const std::vector<RangeJudgement>& ranges, bool is_verified) {
   std::vector<LevelRange> levels;
   for (const RangeJudgement& range : ranges) {
@@ -81,8 +84,8 @@ std::string LevelsText(const std::vector<RangeJudgement>& ranges, bool is_verifi
   return Joined(texts);
 }
 
-// The faults that packages have most often, in words that name the entry; "%s" is the parameter of
-// that number. Of all others apksig's own sentence is told.
+// Sentences for the most frequent faults. "%s" stands for the issue's parameter of that number,
+// such as the entry's name. All other faults are reported in apksig's own sentence.
 constexpr struct {
   const char* issue;
   size_t parameter;
@@ -96,7 +99,7 @@ constexpr struct {
     {"JAR_SIG_ZIP_ENTRY_NOT_SIGNED", 0, "%s is not signed"},
     {"JAR_SIG_DUPLICATE_ZIP_ENTRY", 0, "%s is in it more than once"},
     {"JAR_SIG_MISSING_APK_SIG_REFERENCED", 2,
-     "it was signed with %s as well, and that signature is gone"},
+     "it was also signed with %s, but that signature is missing"},
     {"MIN_SIG_SCHEME_FOR_TARGET_SDK_NOT_MET", 0,
      "an app that targets API %s must be signed with v2 or later"},
     {"V2_SIG_APK_DIGEST_DID_NOT_VERIFY", SIZE_MAX, "it was changed after it was signed with v2"},

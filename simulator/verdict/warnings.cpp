@@ -1,4 +1,4 @@
-// The warnings: facts that deserve a second look.
+// The warnings: facts that the user should look at.
 #include <algorithm>
 #include <ctime>
 
@@ -54,19 +54,20 @@ bool IsJarSigner(const PublicKey& key, const Report& report) {
 
 namespace {
 
-// Other readers of the package find another signer or name than the tool.
+// Warns if other programs find another signer or package name than the tool does.
 void WarnOfTwoFaces(const PackageFacts& facts, const Report& report, Reasons* warnings) {
   const JarSignatureFacts& jar = facts.jar;
   if (report.key && jar.certificate) {
     const std::string& shown = jar.certificate->key.modulus_sha256;
     const std::string detail =
-        shown.empty() ? "none that others read" : "modulus SHA-256 digest: " + shown;
+        shown.empty() ? "no key that others can read" : "modulus SHA-256 digest: " + shown;
     if (shown != report.key->sha256) warnings->push_back({&cause::kCertificateOtherKey, detail});
   }
   if (jar.key && (!jar.certificate || !jar.block.is_whole)) {
-    warnings->push_back({&cause::kBlockAmbiguous, "it is not encoded strictly"});
+    warnings->push_back({&cause::kBlockAmbiguous, "it is not strict DER"});
   } else if (jar.names_other_certificate) {
-    warnings->push_back({&cause::kBlockAmbiguous, "it names another certificate than its first"});
+    warnings->push_back(
+        {&cause::kBlockAmbiguous, "it names a certificate other than its first one"});
   }
   const AndroidManifest& manifest = facts.manifest;
   if (manifest.package_name && *manifest.package_name != manifest.installer_name) {
@@ -97,7 +98,7 @@ void WarnOfSigners(const PackageFacts& facts, const Report& report, Reasons* war
   }
 }
 
-// Wherever a digest of the JAR signature is one of those for which collisions are known.
+// Collisions of SHA-1 and MD5 are known. Lists each use of them in the JAR signature.
 void WarnOfWeakDigests(const PackageFacts& facts, Reasons* warnings) {
   const auto is_weak = [](const std::string& name) {
     return name.compare(0, 4, "SHA1") == 0 || name.compare(0, 3, "MD5") == 0;
@@ -132,7 +133,7 @@ void WarnOfExpiry(const PackageFacts& facts, int64_t now, Reasons* warnings) {
   }
 }
 
-// The signers' certificates of all schemes, each once. Phones know a signer by it.
+// The signers' certificates of all schemes, each once. Phones identify a signer by its certificate.
 std::vector<const CertificateFacts*> Certificates(const PackageFacts& facts) {
   std::vector<const CertificateFacts*> certificates;
   const auto add = [&certificates](const CertificateFacts& certificate) {
@@ -146,7 +147,7 @@ std::vector<const CertificateFacts*> Certificates(const PackageFacts& facts) {
   return certificates;
 }
 
-// One warning for a scheme that has another signer than the JAR signature.
+// One warning for each scheme that has another signer than the JAR signature.
 void WarnOfOtherKeys(const PackageFacts& facts, const Report& report, Reasons* warnings) {
   if (!report.key && !report.signer) return;
   for (const std::string& scheme : NewerSchemes(facts)) {
@@ -162,7 +163,8 @@ void WarnOfOtherKeys(const PackageFacts& facts, const Report& report, Reasons* w
   }
 }
 
-// The signature file names the schemes by their numbers: "2, 3".
+// The signature file lists the numbers of the package's schemes: "2, 3". Warns of schemes in that
+// list that the package does not have.
 void WarnOfStrippedSchemes(const PackageFacts& facts, Reasons* warnings) {
   const std::vector<std::string> present = NewerSchemes(facts);
   std::vector<std::string> missing;
@@ -209,7 +211,7 @@ void WarnOfEntries(const PackageFacts& facts, const Report& report, Reasons* war
                                                      Counted(bytes, "byte", "bytes") + ")"});
 }
 
-// Whether an item says of the entry already that it is not the one that was signed.
+// True if an item already reports that the entry was changed after signing.
 bool IsSaid(const std::string& entry, const Report& report) {
   return std::any_of(report.items.begin(), report.items.end(), [&](const Item& item) {
     const Cause* const why = item.reason.cause;

@@ -14,7 +14,7 @@ inline std::string Counted(uint64_t count, const char* one, const char* many) {
   return std::to_string(count) + " " + (count == 1 ? one : many);
 }
 
-// Such as "v1, v2".
+// One text: "v1, v2".
 inline std::string Joined(const std::vector<std::string>& words) {
   std::string text;
   for (const std::string& word : words) text += (text.empty() ? "" : ", ") + word;
@@ -27,11 +27,12 @@ inline std::string CountedNames(const std::vector<std::string>& names) {
          (names.size() > 1 ? ", ..." : "");
 }
 
-// Such as "API 27 and later".
+// The range in words: "API 27 and later".
 std::string LevelText(const LevelRange& levels);
 
-// Names the phones that take the package, and the schemes by which they know its signer: "phones of
-// API 27 and later take it, by v2, v3". Empty unless all phones that were asked about take it.
+// Names the phones that install the package, and the schemes by which they verify its signer:
+// "phones of API 27 and later install it, verified by v2, v3". Empty unless all phones that apksig
+// was asked about install it.
 std::string TakersText(const Judgement& judgement);
 
 // The name of the JAR signer's key, such as "RSA-2048": by the tool's reading, else by the

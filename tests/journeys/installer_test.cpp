@@ -51,9 +51,9 @@ json VerdictOf(const std::string& name, Lines options = {}) {
 
 TEST(Installer, TakesWhatApksignerSigned) {
   EXPECT_EQ(Told("apksigner-sha256-2048"),
-            Lines({"SIGNED", "phones of API 27 and later take it, by v2, v3", "-> 0"}));
+            Lines({"SIGNED", "phones of API 27 and later install it, verified by v2, v3", "-> 0"}));
   EXPECT_EQ(Told("v1-alone"),
-            Lines({"SIGNED", "phones of API 27 and later take it, by v1", "-> 0"}));
+            Lines({"SIGNED", "phones of API 27 and later install it, verified by v1", "-> 0"}));
 }
 
 // The tool does not look at AndroidManifest.xml, so that anybody can put another app's signature
@@ -144,15 +144,16 @@ TEST(Installer, RefusesWhatWasChangedUnderANewerSignature) {
 }
 
 TEST(Installer, SaysWhichPhonesRefuse) {
-  EXPECT_EQ(Told("target-30-v1-alone"),
-            Lines({"NOT INSTALLABLE",
-                   "phones of API 30 and later refuse it, those of API 27 to 29 take it: an app "
-                   "that targets API 30 must be signed with v2 or later",
-                   "-> 1"}));
+  EXPECT_EQ(
+      Told("target-30-v1-alone"),
+      Lines({"NOT INSTALLABLE",
+             "phones of API 27 to 29 install it, but phones of API 30 and later refuse it: an app "
+             "that targets API 30 must be signed with v2 or later",
+             "-> 1"}));
   EXPECT_EQ(Told("target-30-v1-alone", {"--api", "27-29"}),
-            Lines({"SIGNED", "phones of API 27 to 29 take it, by v1", "-> 0"}));
+            Lines({"SIGNED", "phones of API 27 to 29 install it, verified by v1", "-> 0"}));
   EXPECT_EQ(Told("target-30-v1-alone", {"--api", "29"}),
-            Lines({"SIGNED", "phones of API 29 take it, by v1", "-> 0"}));
+            Lines({"SIGNED", "phones of API 29 install it, verified by v1", "-> 0"}));
 }
 
 TEST(Installer, RefusesAPackageForNewerPhonesThanThoseAskedAbout) {
@@ -164,30 +165,32 @@ TEST(Installer, RefusesAPackageForNewerPhonesThanThoseAskedAbout) {
 
 TEST(Installer, AnotherSignerIsSaidInTheVerdict) {
   // Newer versions of apksigner write v3.1 for a rotated key as well.
-  const std::string takers = "phones of API 27 and later take it, by v2, v3";
+  const std::string takers = "phones of API 27 and later install it, verified by v2, v3";
   Lines rotated = Told("rotated-key");
   ASSERT_EQ(rotated.size(), 3U);
   rotated[1].resize(takers.size());
   EXPECT_EQ(rotated, Lines({"SIGNED, OTHER SIGNER", takers, "-> 0"}));
   EXPECT_EQ(Told("two-signers"),
-            Lines({"SIGNED, OTHER SIGNER", "phones of API 27 and later take it, by v2", "-> 0"}));
+            Lines({"SIGNED, OTHER SIGNER", "phones of API 27 and later install it, verified by v2",
+                   "-> 0"}));
   // Phones before API 28 know v2 alone, which the first key made.
   EXPECT_EQ(Told("rotated-key", {"--api", "27"}),
-            Lines({"SIGNED", "phones of API 27 take it, by v2", "-> 0"}));
+            Lines({"SIGNED", "phones of API 27 install it, verified by v2", "-> 0"}));
 }
 
 // The verifier names one signer for all levels that it is asked about at once: the first key's.
 TEST(Installer, SignerForLaterPhonesAloneIsFound) {
-  EXPECT_EQ(
-      Told("later-v3"),
-      Lines({"NOT INSTALLABLE",
-             "phones of API 28 to 29 refuse it, those of API 27, API 30 and later take it: none "
-             "of its signatures is for these phones (NO_SIGNATURE_FOR_LEVELS)",
-             "-> 1"}));
+  EXPECT_EQ(Told("later-v3"),
+            Lines({"NOT INSTALLABLE",
+                   "phones of API 27, API 30 and later install it, but phones of API 28 to 29 "
+                   "refuse it: none "
+                   "of its signatures is for these phones (NO_SIGNATURE_FOR_LEVELS)",
+                   "-> 1"}));
   EXPECT_EQ(Told("later-v3", {"--api", "27"}),
-            Lines({"SIGNED", "phones of API 27 take it, by v2", "-> 0"}));
+            Lines({"SIGNED", "phones of API 27 install it, verified by v2", "-> 0"}));
   EXPECT_EQ(Told("later-v3", {"--api", "30-"}),
-            Lines({"SIGNED, OTHER SIGNER", "phones of API 30 and later take it, by v3", "-> 0"}));
+            Lines({"SIGNED, OTHER SIGNER", "phones of API 30 and later install it, verified by v3",
+                   "-> 0"}));
 }
 
 // Older versions of apksig do not know v3.1, and would name the first key for all phones.
@@ -203,14 +206,15 @@ TEST(Installer, RefusalOfTheOldestPhonesIsNotHiddenByV3) {
   EXPECT_EQ(
       Told("without-v2"),
       Lines({"NOT INSTALLABLE",
-             "phones of API 27 refuse it, those of API 28 and later take it: it was signed with "
-             "APK Signature Scheme v2 as well, and that signature is gone",
+             "phones of API 28 and later install it, but phones of API 27 refuse it: it was also "
+             "signed with APK Signature Scheme v2, but that signature is missing",
              "-> 1"}));
 }
 
 TEST(Installer, RefusalOfTheToolStays) {
-  EXPECT_EQ(Told("apksigner-ec"),
-            Lines({"REFUSED", "phones of API 27 and later take it, by v2, v3", "-> 1"}));
+  EXPECT_EQ(
+      Told("apksigner-ec"),
+      Lines({"REFUSED", "phones of API 27 and later install it, verified by v2, v3", "-> 1"}));
   EXPECT_EQ(Told("changed-dex")[0], "REFUSED");
 }
 

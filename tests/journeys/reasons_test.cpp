@@ -517,13 +517,14 @@ TEST_F(Reason, LibrariesThatDoNotLieBesideThePackage) {
   Take("apksigner-sha256-2048");
   Do("rm -r lib");
   const std::string absent =
-      "nothing to sign: no libraries for its processor lie beside the package";
-  EXPECT_EQ(Told(7),
-            Lines({"SIGNED  base.apk" + ByRsa2048(), kSigned,
-                   "  – lib/arm64/libvault.so  " + absent, "  – lib/arm/libvault.so    " + absent,
-                   "      Nothing to do for a phone of another kind. To lay out those of all",
-                   "      processors: --install=all.",
-                   "  ✓ key                    registered for com.example.vault", "-> 0"}));
+      "nothing to sign: no libraries for its processor are beside the package";
+  EXPECT_EQ(
+      Told(7),
+      Lines({"SIGNED  base.apk" + ByRsa2048(), kSigned, "  – lib/arm64/libvault.so  " + absent,
+             "  – lib/arm/libvault.so    " + absent,
+             "      Nothing to do for a phone with another processor. To lay out the libraries",
+             "      of all processors, give --install=all.",
+             "  ✓ key                    registered for com.example.vault", "-> 0"}));
   EXPECT_EQ(Told(1, {"--strict"}), Lines({"PARTLY SIGNED  base.apk", "-> 1"}));
   EXPECT_EQ(Told(5, {"--install=all"}),
             Lines({"SIGNED  base.apk" + ByRsa2048(), kSigned, "  ✓ lib/arm64/libvault.so  signed",
@@ -563,7 +564,7 @@ TEST_F(Reason, LibraryOfOneProcessorThatWasNotInstalled) {
   Do("rm -r lib/arm");
   EXPECT_EQ(Told(4)[2], "  ✓ lib/arm64/libvault.so  signed");
   EXPECT_EQ(Told(4)[3],
-            "  – lib/arm/libvault.so    nothing to sign: no libraries for its processor lie beside "
+            "  – lib/arm/libvault.so    nothing to sign: no libraries for its processor are beside "
             "the package");
 }
 

@@ -112,7 +112,7 @@ TEST(Doubtful, KeyThatWasRotated) {
   const std::string newest = schemes.find("v3.1") != std::string::npos ? "v3.1" : "v3";
   const std::string beginning = "  ! the " + newest + " signature (CN=rsa-2048-other, O=Example, ";
   EXPECT_EQ(LineWith(told, "  ! ").substr(0, beginning.size()), beginning);
-  EXPECT_NE(LineWith(told, "  ! ").find("is of another key than the JAR signature"),
+  EXPECT_NE(LineWith(told, "  ! ").find("is made with another key than the JAR signature"),
             std::string::npos);
 }
 

@@ -79,8 +79,8 @@ TEST(PageTable, SaysWhyAndWhose) {
   good.key = {std::string(64, 'b'), 2048, true};
   good.warnings = {{&cause::kOtherPackageName, "\"com.evil\""}};
   EXPECT_EQ(RowsOf({refused, good}),
-            (Lines{"PARTLY SIGNED|a|lib/arm/a.so: it does not lie beside the package, where others "
-                   "are|1|com.app||",
+            (Lines{"PARTLY SIGNED|a|lib/arm/a.so: it is not beside the package, but other "
+                   "libraries are|1|com.app||",
                    "SIGNED|b|! phones install it as &quot;com.evil&quot;, but the tool reads "
                    "another package name|1|com.good|CN=Vault, RSA-2048, key bbbbbbbb…bbbbbb|"}));
 }

@@ -347,7 +347,7 @@ TEST(Page, PutsTheToolAndTheInstallerSideBySide) {
        {row("apktoolkit", "good\"><span class=\"mark\" aria-hidden=\"true\">✓</span> signs it",
             schemes + "v1" + cell + "<p>CN=Vault, RSA-2048, key bbbbbbbb…bbbbbb</p>" + cell),
         row("phones of API 27 to 29",
-            "good\"><span class=\"mark\" aria-hidden=\"true\">✓</span> take it",
+            "good\"><span class=\"mark\" aria-hidden=\"true\">✓</span> install it",
             schemes + "v1, v2" + cell + "<p>CN=Other, EC-256</p>" + cell +
                 "<p>warning: a warning</p>"),
         row("phones of API 30 and later",
@@ -373,7 +373,7 @@ TEST(Page, SaysWhereTheInstallerWasNotAskedOrGaveUp) {
   const std::string page = PageOf(report);
   EXPECT_TRUE(Has(page, "</span> the verifier gave up</td>"));
   EXPECT_TRUE(Has(page, "<p>it took too long</p>"));
-  EXPECT_TRUE(Has(page, "</span> signs a part of it</td>"));
+  EXPECT_TRUE(Has(page, "</span> signs only a part of it</td>"));
 }
 
 // The command line's demands are not the tool's.
@@ -400,7 +400,8 @@ TEST(Page, KeepsTheNamesOfOptionsWhole) {
   report.items = {Library("a", &cause::kLibraryNotInstalled)};
   report.items[0].state = ItemState::kAbsent;
   EXPECT_TRUE(Has(PageOf(report),
-                  "<p class=\"cure\">Nothing to do for a phone of another kind. To lay out those "
-                  "of all processors: <span class=\"option\">--install=all</span>.</p>"));
+                  "<p class=\"cure\">Nothing to do for a phone with another processor. To lay out "
+                  "the libraries of all processors, give <span "
+                  "class=\"option\">--install=all</span>.</p>"));
   EXPECT_TRUE(Has(PageOf(report), ".option { white-space: nowrap; }"));
 }

@@ -90,7 +90,7 @@ TEST(VerdictEvent, HoldsTheWholeReport) {
        "cure": "The file was good. docs/guide.md, \"When the kernel refuses\", says where to look."},
       {"kind": "library", "name": "lib/arm/a.so", "entry": "lib/armeabi/a.so", "state": "absent",
        "reason": "library-missing",
-       "text": "it does not lie beside the package, where others are",
+       "text": "it is not beside the package, but other libraries are",
        "cure": "Install the package again, unless the installer leaves it out on purpose."},
       {"kind": "library", "name": "lib/x86/a.so", "entry": "lib/x86/a.so",
        "state": "nothing-to-sign", "reason": "library-other-abi",

@@ -106,7 +106,7 @@ TEST(HeadFacts, HaveTheReasonInPlaceOfTheSigner) {
       Library(&cause::kLibraryMissing),
       {ItemKind::kKey, "com.app", "", ItemState::kRefused, {&cause::kRegistrationRefused, "7"}}};
   EXPECT_EQ(HeadFacts(report, "..."),
-            Lines({"lib/arm64/a.so: it does not lie beside the package, where others are"}));
+            Lines({"lib/arm64/a.so: it is not beside the package, but other libraries are"}));
   report.items[1].state = ItemState::kAbsent;
   EXPECT_EQ(HeadFacts(report, "..."), Lines({"libzu answered 7"}));
 }
@@ -133,7 +133,7 @@ TEST(HeadFacts, HaveASignerWhoWasNotExpectedBesideAnyReason) {
   report.items = {Library(&cause::kLibraryMissing), signer};
   report.items[0].state = ItemState::kRefused;
   EXPECT_EQ(HeadFacts(report, "..."),
-            Lines({"lib/arm64/a.so: it does not lie beside the package, where others are",
+            Lines({"lib/arm64/a.so: it is not beside the package, but other libraries are",
                    "its signer is not one that --signer names: who"}));
   report.verdict = Verdict::kNotAccepted;
   report.items = {signer};

@@ -55,7 +55,8 @@ TEST(InstallerItem, IsThereForARefusalAlone) {
   EXPECT_EQ(Told({}), "");
   EXPECT_EQ(Told({Judgement::State::kMissing, "why", {}}), "");
   EXPECT_EQ(Told(Judged({Taken(27, kNewestLevel)})), "");
-  EXPECT_EQ(TakersText(Judged({Taken(27, 33)})), "phones of API 27 to 33 take it, by v1, v2");
+  EXPECT_EQ(TakersText(Judged({Taken(27, 33)})),
+            "phones of API 27 to 33 install it, verified by v1, v2");
 }
 
 TEST(InstallerItem, SaysWhatNoPhoneTakes) {
@@ -67,13 +68,13 @@ TEST(InstallerItem, SaysWhatNoPhoneTakes) {
 TEST(InstallerItem, SaysWhichPhonesTakeIt) {
   const Judgement judgement = Judged({Taken(27, 29), Refused(30, kNewestLevel, kFault)});
   EXPECT_EQ(Told(judgement),
-            "not-installable-on-some: phones of API 30 and later refuse it, those of API 27 to 29 "
-            "take it: a fault of x (A_FAULT)");
+            "not-installable-on-some: phones of API 27 to 29 install it, but phones of API 30 and "
+            "later refuse it: a fault of x (A_FAULT)");
   EXPECT_EQ(TakersText(judgement), "");
   EXPECT_EQ(Told(Judged({Refused(27, 27, kFault), Taken(28, 29), Refused(30, 32, kFault),
                          Refused(33, 33, kFault)})),
-            "not-installable-on-some: phones of API 27, API 30 to 33 refuse it, those of API 28 to "
-            "29 take it: a fault of x (A_FAULT)");
+            "not-installable-on-some: phones of API 28 to 29 install it, but phones of API 27, API "
+            "30 to 33 refuse it: a fault of x (A_FAULT)");
 }
 
 TEST(InstallerItem, NamesTheEntry) {
@@ -112,7 +113,7 @@ TEST(OtherSigner, IsOneOfTheNewestScheme) {
   EXPECT_TRUE(is_other({{"v2", "other"}, {"v2", "own"}}));
 }
 
-// The newest phones that take it count.
+// The newest phones that install it count.
 TEST(OtherSigner, IsTheOneOfTheNewestPhones) {
   Report report;
   report.signer = WithKey("own");

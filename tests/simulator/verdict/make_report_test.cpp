@@ -241,7 +241,7 @@ TEST(MakeReport, DamagedEntriesAreADoubtAndForTheStrictARefusal) {
   EXPECT_EQ(report.verdict, Verdict::kSigned);
   ASSERT_EQ(report.warnings.size(), 1U);
   EXPECT_EQ(report.warnings[0].Text(),
-            "the archive is damaged at 2 entries: res/a, ..., which nobody can read");
+            "the archive is damaged and cannot be read at 2 entries: res/a, ...");
   const Report strict = Made({Sign(kFile, kPackagePayload)}, facts, {true});
   EXPECT_EQ(strict.verdict, Verdict::kPartlySigned);
   EXPECT_TRUE(strict.warnings.empty());

@@ -67,7 +67,7 @@ TEST(Warnings, CertificateThatShowsAnotherKeyThanTheKernelGets) {
   facts.jar.certificate->key.modulus_sha256 = kOther;
   EXPECT_EQ(Warnings(facts), Lines({"certificate-other-key: modulus SHA-256 digest: " + kOther}));
   facts.jar.certificate->key.modulus_sha256 = "";
-  EXPECT_EQ(Warnings(facts), Lines({"certificate-other-key: none that others read"}));
+  EXPECT_EQ(Warnings(facts), Lines({"certificate-other-key: no key that others can read"}));
   EXPECT_EQ(cause::kCertificateOtherKey.severity, Severity::kAlarm);
 }
 
@@ -91,14 +91,14 @@ TEST(Warnings, WithoutAKeyThereIsNoneToDifferFrom) {
 TEST(Warnings, BlockThatOthersReadInAnotherWay) {
   PackageFacts facts = Good();
   facts.jar.block.is_whole = false;
-  EXPECT_EQ(Warnings(facts), Lines({"block-ambiguous: it is not encoded strictly"}));
+  EXPECT_EQ(Warnings(facts), Lines({"block-ambiguous: it is not strict DER"}));
   facts = Good();
   facts.jar.certificate.reset();
-  EXPECT_EQ(Warnings(facts), Lines({"block-ambiguous: it is not encoded strictly"}));
+  EXPECT_EQ(Warnings(facts), Lines({"block-ambiguous: it is not strict DER"}));
   facts = Good();
   facts.jar.names_other_certificate = true;
   EXPECT_EQ(Warnings(facts),
-            Lines({"block-ambiguous: it names another certificate than its first"}));
+            Lines({"block-ambiguous: it names a certificate other than its first one"}));
   EXPECT_EQ(cause::kBlockAmbiguous.severity, Severity::kAlarm);
 }
 
