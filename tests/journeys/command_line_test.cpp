@@ -20,9 +20,9 @@ class CommandLine : public testing::Test {
  protected:
   CommandLine() { MakePackage().WriteTo(apk_); }
 
-  const TempDir folder_;
-  const std::string apk_ = folder_ / "base.apk";
-  const std::string library_ = folder_.Write("lib/arm64/libfoo.so", ToBytes("\177ELF foo"));
+  const TempDir directory_;
+  const std::string apk_ = directory_ / "base.apk";
+  const std::string library_ = directory_.Write("lib/arm64/libfoo.so", ToBytes("\177ELF foo"));
 };
 
 void ExpectUsageError(const std::vector<std::string>& arguments) {
@@ -39,7 +39,7 @@ TEST_F(CommandLine, WithoutAPathIsAUsageError) { ExpectUsageError({}); }
 TEST_F(CommandLine, WithTwoPathsIsAUsageError) { ExpectUsageError({apk_, apk_}); }
 
 TEST_F(CommandLine, MissingFileEndsSilently) {
-  const Simulation run = Simulate(folder_ / "none.apk");
+  const Simulation run = Simulate(directory_ / "none.apk");
 
   EXPECT_EQ(run.timeline, Exit(0));
   EXPECT_EQ(run.status, 4);  // the file was not looked at

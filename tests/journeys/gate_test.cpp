@@ -79,10 +79,10 @@ std::vector<json> Events(Lines words) {
 
 // The codes of the warnings of a package that a test has made.
 Lines WarningsOf(const Package& package, const Lines& options = {}) {
-  const TempDir folder;
-  package.WriteTo(folder / "base.apk");
+  const TempDir directory;
+  package.WriteTo(directory / "base.apk");
   Lines words = options;
-  words.push_back(folder / "base.apk");
+  words.push_back(directory / "base.apk");
   const json warnings = Events(words).at(0)["warnings"];
   Lines codes;
   for (const json& warning : warnings) {
@@ -149,8 +149,8 @@ TEST(Signer, OfARefusedPackageIsNotKnown) {
 }
 
 TEST(Signer, OfATrustedJarIsNobody) {
-  const TempDir folder;
-  const std::string jar = folder / "a.jar";
+  const TempDir directory;
+  const std::string jar = directory / "a.jar";
   MakePackage(PlainJar()).WriteTo(jar);
   EXPECT_EQ(Verdicts({"--trust", jar, jar}), Lines({"TRUSTED JAR", "-> 0"}));
   EXPECT_EQ(Verdicts({"--signer", ModulusDigest("rsa-2048"), "--trust", jar, jar}),

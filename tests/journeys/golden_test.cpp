@@ -40,19 +40,19 @@ std::string TestName(const testing::TestParamInfo<const char*>& package) {
 
 // The kernel and libzu get the values that openssl finds in the signer's certificate.
 TEST_P(GoldenPackage, IsSignedWithItsLibrariesAndRegistered) {
-  const std::string folder = Golden(GetParam());
-  const std::string apk = folder + "/base.apk";
-  const Bytes modulus = ReadHex(folder + "/modulus");
+  const std::string directory = Golden(GetParam());
+  const std::string apk = directory + "/base.apk";
+  const Bytes modulus = ReadHex(directory + "/modulus");
   Bytes payload = {32, 0};
-  const Bytes digest = ReadHex(folder + "/digest");
+  const Bytes digest = ReadHex(directory + "/digest");
   payload.insert(payload.end(), digest.begin(), digest.end());
   ASSERT_EQ(payload.size(), 34U);
   ASSERT_GE(modulus.size(), 256U);
 
   const Simulation run = Simulate(apk);
 
-  std::string first = folder + "/lib/arm64/libvault.so";
-  std::string second = folder + "/lib/arm/libvault.so";
+  std::string first = directory + "/lib/arm64/libvault.so";
+  std::string second = directory + "/lib/arm/libvault.so";
   // The zip library's order of entries is its own.
   if (run.timeline.find(second) < run.timeline.find(first)) std::swap(first, second);
   EXPECT_EQ(run.timeline,

@@ -20,9 +20,9 @@ PackageOptions WithLibrary(const std::string& entry_name) {
 }
 
 TEST(GoodPackage, LibraryIsSignedThenThePackageThenItsKeyIsRegistered) {
-  const TempDir folder;
-  const std::string apk = folder / "base.apk";
-  const std::string library = folder.Write("lib/arm64/libfoo.so", kLibrary);
+  const TempDir directory;
+  const std::string apk = directory / "base.apk";
+  const std::string library = directory.Write("lib/arm64/libfoo.so", kLibrary);
   PackageOptions options = WithLibrary("lib/arm64-v8a/libfoo.so");
   options.secure_storage = true;
   MakePackage(options).WriteTo(apk);
@@ -48,9 +48,9 @@ TEST(GoodPackage, LibraryIsSignedThenThePackageThenItsKeyIsRegistered) {
 }
 
 TEST(GoodPackage, WithoutThePermissionItIsNotRegistered) {
-  const TempDir folder;
-  const std::string apk = folder / "base.apk";
-  const std::string library = folder.Write("lib/arm64/libfoo.so", kLibrary);
+  const TempDir directory;
+  const std::string apk = directory / "base.apk";
+  const std::string library = directory.Write("lib/arm64/libfoo.so", kLibrary);
   MakePackage(WithLibrary("lib/arm64-v8a/libfoo.so")).WriteTo(apk);
 
   const Simulation run = Simulate(apk);
@@ -61,8 +61,8 @@ TEST(GoodPackage, WithoutThePermissionItIsNotRegistered) {
 }
 
 TEST(GoodPackage, WithoutLibrariesOnlyThePackageIsSigned) {
-  const TempDir folder;
-  const std::string apk = folder / "base.apk";
+  const TempDir directory;
+  const std::string apk = directory / "base.apk";
   PackageOptions options;
   options.entries = {{"classes.dex", ToBytes("dex\n035")}};
   MakePackage(options).WriteTo(apk);
@@ -74,8 +74,8 @@ TEST(GoodPackage, WithoutLibrariesOnlyThePackageIsSigned) {
 }
 
 TEST(GoodPackage, WithoutADexFileIsGood) {
-  const TempDir folder;
-  const std::string apk = folder / "base.apk";
+  const TempDir directory;
+  const std::string apk = directory / "base.apk";
   PackageOptions options;
   options.entries = {};
   MakePackage(options).WriteTo(apk);
@@ -97,9 +97,9 @@ void PrintTo(const Row& row, std::ostream* out) { *out << row.entry_name; }
 class LibraryDirectory : public testing::TestWithParam<Row> {};
 
 TEST_P(LibraryDirectory, IsWhereTheEntryIsSigned) {
-  const TempDir folder;
-  const std::string apk = folder / "base.apk";
-  const std::string library = folder.Write(GetParam().installed, kLibrary);
+  const TempDir directory;
+  const std::string apk = directory / "base.apk";
+  const std::string library = directory.Write(GetParam().installed, kLibrary);
   MakePackage(WithLibrary(GetParam().entry_name)).WriteTo(apk);
 
   const Simulation run = Simulate(apk);
@@ -122,9 +122,9 @@ INSTANTIATE_TEST_SUITE_P(
 class NoLibrary : public testing::TestWithParam<Row> {};
 
 TEST_P(NoLibrary, IsPassedOverSilently) {
-  const TempDir folder;
-  const std::string apk = folder / "base.apk";
-  folder.Write(GetParam().installed, kLibrary);
+  const TempDir directory;
+  const std::string apk = directory / "base.apk";
+  directory.Write(GetParam().installed, kLibrary);
   MakePackage(WithLibrary(GetParam().entry_name)).WriteTo(apk);
 
   const Simulation run = Simulate(apk);
@@ -137,16 +137,16 @@ INSTANTIATE_TEST_SUITE_P(
     Rows, NoLibrary,
     testing::Values(Row{"OtherProcessor", "lib/x86/libfoo.so", "lib/x86/libfoo.so"},
                     Row{"OtherSuffix", "lib/arm64-v8a/libfoo.so.1", "lib/arm64/libfoo.so.1"},
-                    Row{"OtherFolder", "assets/lib/arm64-v8a/libfoo.so", "lib/arm64/libfoo.so"}),
+                    Row{"OtherDirectory", "assets/lib/arm64-v8a/libfoo.so", "lib/arm64/libfoo.so"}),
     [](const auto& row) { return row.param.description; });
 
-TEST(GoodPackage, NamedWithoutAFolderIsFoundThroughItsDescriptor) {
-  const TempDir folder;
-  const std::string apk = folder / "base.apk";
-  const std::string library = folder.Write("lib/arm64/libfoo.so", kLibrary);
+TEST(GoodPackage, NamedWithoutADirectoryIsFoundThroughItsDescriptor) {
+  const TempDir directory;
+  const std::string apk = directory / "base.apk";
+  const std::string library = directory.Write("lib/arm64/libfoo.so", kLibrary);
   MakePackage(WithLibrary("lib/arm64-v8a/libfoo.so")).WriteTo(apk);
 
-  const Simulation run = Simulate("base.apk", {}, {{}, folder.path()});
+  const Simulation run = Simulate("base.apk", {}, {{}, directory.path()});
 
   EXPECT_EQ(run.timeline,
             Timeline({LibraryStep({SignedLibrary(library)}), PackageStep(apk), Exit(0)}));
@@ -154,9 +154,9 @@ TEST(GoodPackage, NamedWithoutAFolderIsFoundThroughItsDescriptor) {
 }
 
 TEST(GoodPackage, ReachedThroughALinkHasItsLibrariesBesideTheFileItself) {
-  const TempDir folder;
-  const std::string apk = folder / "base.apk";
-  const std::string library = folder.Write("lib/arm64/libfoo.so", kLibrary);
+  const TempDir directory;
+  const std::string apk = directory / "base.apk";
+  const std::string library = directory.Write("lib/arm64/libfoo.so", kLibrary);
   MakePackage(WithLibrary("lib/arm64-v8a/libfoo.so")).WriteTo(apk);
   const TempDir elsewhere;
   std::filesystem::create_symlink(apk, elsewhere / "link.apk");

@@ -111,7 +111,7 @@ TEST(Entries, LibraryChangedInsideThePackageIsNotBlamedOnTheInstallation) {
 // A fault of the package, and not one that the verifier does not survive. The length of an entry is
 // in its local header, and in the record of the central directory.
 TEST(Installer, RefusesAnEntryThatIsLongerThanItSays) {
-  const TempDir folder;
+  const TempDir directory;
   const ProcessResult made = RunProcess({"bash", "-e", "-c", R"(cp -r "$0"/* .
 python3 -c '
 import struct, zipfile
@@ -122,9 +122,9 @@ for field in (at + 22, data.rindex(name.encode()) - 46 + 24):
     struct.pack_into("<I", data, field, 10)
 open("base.apk", "wb").write(data)')",
                                          Golden("v1-alone")},
-                                        folder.path());
+                                        directory.path());
   ASSERT_EQ(made.status, 0) << made.errors;
-  const ProcessResult run = RunProcess({SimulatorPath(), "base.apk"}, folder.path());
+  const ProcessResult run = RunProcess({SimulatorPath(), "base.apk"}, directory.path());
   EXPECT_EQ(run.status, 1);
   EXPECT_NE(run.output.find("phones do not install it: Failed to read data of compressed entry "
                             "META-INF/CERT.SF (MALFORMED_APK)\n"),
@@ -249,7 +249,7 @@ TEST(Installer, JournalHasTheWholeAnswer) {
 
 // An answer is one line of JSON, be the names of the entries as they may.
 TEST(Installer, OddNamesDoNotBreakTheAnswer) {
-  const TempDir folder;
+  const TempDir directory;
   const ProcessResult made = RunProcess({"python3", "-c", R"(
 import shutil, sys, zipfile
 shutil.copy(sys.argv[1], "base.apk")
@@ -257,21 +257,21 @@ with zipfile.ZipFile("base.apk", "a") as archive:
     for name in ('a"b\\c', "line\nend", "\u202e", "gr\u00fcn", "\U0001f600"):
         archive.writestr(name, "x"))",
                                          Golden("v1-alone") + "/base.apk"},
-                                        folder.path());
+                                        directory.path());
   ASSERT_EQ(made.status, 0) << made.errors;
-  const ProcessResult run = RunProcess({SimulatorPath(), "--quiet", "base.apk"}, folder.path());
+  const ProcessResult run = RunProcess({SimulatorPath(), "--quiet", "base.apk"}, directory.path());
   EXPECT_EQ(run.output.substr(0, 17), "NOT INSTALLABLE  ") << run.output << run.errors;
 }
 
 // Java is missing, too, and no line says so.
 TEST(Installer, IsNotAskedAboutAJar) {
-  const TempDir folder;
+  const TempDir directory;
   const ProcessResult made = RunProcess(
       {"python3", "-c", "import zipfile; zipfile.ZipFile('a.jar', 'w').writestr('a', 'a')"},
-      folder.path());
+      directory.path());
   ASSERT_EQ(made.status, 0) << made.errors;
   const ProcessResult run =
-      RunProcess({"env", "PATH=/nowhere", SimulatorPath(), "--json", "a.jar"}, folder.path());
+      RunProcess({"env", "PATH=/nowhere", SimulatorPath(), "--json", "a.jar"}, directory.path());
   EXPECT_NE(run.output.find(R"("installer":{"state":"not-asked","levels":[]})"), std::string::npos)
       << run.output;
   EXPECT_EQ(run.errors, "");

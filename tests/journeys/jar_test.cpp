@@ -24,11 +24,11 @@ void WriteJar(const std::string& path) {
   MakePackage(options).WriteTo(path);
 }
 
-// A folder on a file system that keeps extended attributes of users.
+// A directory on a file system that keeps extended attributes of users.
 std::string PlaceForAttributes() {
   for (const char* place : {"/tmp", "/var/tmp", "/dev/shm", "."}) {
-    const TempDir folder(place);
-    const std::string file = folder.Write("probe", {});
+    const TempDir directory(place);
+    const std::string file = directory.Write("probe", {});
     if (setxattr(file.c_str(), "user.zu", "1", 1, 0) == 0) return place;
   }
   ADD_FAILURE() << "no file system with extended attributes of users";
@@ -78,8 +78,8 @@ std::string RegisteredJar(const std::string& path) {
 }
 
 TEST(Jar, TrustedIsSignedWithAnEmptyPayload) {
-  const TempDir folder;
-  const std::string jar = folder / "framework.jar";
+  const TempDir directory;
+  const std::string jar = directory / "framework.jar";
   WriteJar(jar);
 
   const Simulation run = Simulate(jar, {"--trust", jar});
@@ -95,8 +95,8 @@ TEST(Jar, TrustedIsSignedWithAnEmptyPayload) {
 }
 
 TEST(Jar, NotTrustedIsNotSigned) {
-  const TempDir folder;
-  const std::string jar = folder / "framework.jar";
+  const TempDir directory;
+  const std::string jar = directory / "framework.jar";
   WriteJar(jar);
 
   const Simulation run = Simulate(jar);
@@ -106,8 +106,8 @@ TEST(Jar, NotTrustedIsNotSigned) {
 }
 
 TEST(Jar, TheKernelsReasonIsLogged) {
-  const TempDir folder;
-  const std::string jar = folder / "framework.jar";
+  const TempDir directory;
+  const std::string jar = directory / "framework.jar";
   WriteJar(jar);
 
   const Simulation run = Simulate(jar, {"--verify-errno", "EKEYREVOKED"});
@@ -117,8 +117,8 @@ TEST(Jar, TheKernelsReasonIsLogged) {
 }
 
 TEST(Jar, TrustedWithTheAttributeIsSignedAndRegisteredUnderItsPath) {
-  const TempDir folder(PlaceForAttributes());
-  const std::string jar = folder / "framework.jar";
+  const TempDir directory(PlaceForAttributes());
+  const std::string jar = directory / "framework.jar";
   WriteJar(jar);
   SetAttribute(jar, "1");
 
@@ -129,8 +129,8 @@ TEST(Jar, TrustedWithTheAttributeIsSignedAndRegisteredUnderItsPath) {
 }
 
 TEST(Jar, NotTrustedWithTheAttributeIsRegisteredAllTheSame) {
-  const TempDir folder(PlaceForAttributes());
-  const std::string jar = folder / "framework.jar";
+  const TempDir directory(PlaceForAttributes());
+  const std::string jar = directory / "framework.jar";
   WriteJar(jar);
   SetAttribute(jar, "1");
 
@@ -141,8 +141,8 @@ TEST(Jar, NotTrustedWithTheAttributeIsRegisteredAllTheSame) {
 }
 
 TEST(Jar, WithAnEmptyAttributeIsNotRegistered) {
-  const TempDir folder(PlaceForAttributes());
-  const std::string jar = folder / "framework.jar";
+  const TempDir directory(PlaceForAttributes());
+  const std::string jar = directory / "framework.jar";
   WriteJar(jar);
   SetAttribute(jar, "");
 
@@ -153,8 +153,8 @@ TEST(Jar, WithAnEmptyAttributeIsNotRegistered) {
 }
 
 TEST(Jar, RefusedRegistrationIsLogged) {
-  const TempDir folder(PlaceForAttributes());
-  const std::string jar = folder / "framework.jar";
+  const TempDir directory(PlaceForAttributes());
+  const std::string jar = directory / "framework.jar";
   WriteJar(jar);
   SetAttribute(jar, "1");
 
@@ -168,8 +168,8 @@ TEST(Jar, RefusedRegistrationIsLogged) {
 }
 
 TEST(Jar, RefusedSignatureIsLogged) {
-  const TempDir folder;
-  const std::string jar = folder / "framework.jar";
+  const TempDir directory;
+  const std::string jar = directory / "framework.jar";
   WriteJar(jar);
 
   const Simulation run = Simulate(jar, {"--trust", jar, "--sign-errno", "EPERM"});
@@ -184,8 +184,8 @@ TEST(Jar, RefusedSignatureIsLogged) {
 }
 
 TEST(Jar, TamperedSignatureDoesNotMatterToOneThatIsTrusted) {
-  const TempDir folder;
-  const std::string jar = folder / "framework.jar";
+  const TempDir directory;
+  const std::string jar = directory / "framework.jar";
   PackageOptions options;
   options.android_manifest = Bytes();
   Package package = MakePackage(options);
@@ -208,8 +208,8 @@ std::string NotAnArchive(const std::string& path, const std::string& reason) {
 }
 
 TEST(OtherFile, ThatIsNoArchiveIsRefusedByEachStep) {
-  const TempDir folder;
-  const std::string file = folder.Write("notes.txt", Bytes(1000, 'x'));
+  const TempDir directory;
+  const std::string file = directory.Write("notes.txt", Bytes(1000, 'x'));
 
   const Simulation run = Simulate(file, {"--trust", file});
 
@@ -218,8 +218,8 @@ TEST(OtherFile, ThatIsNoArchiveIsRefusedByEachStep) {
 }
 
 TEST(OtherFile, ThatIsEmptyIsRefusedByEachStep) {
-  const TempDir folder;
-  const std::string file = folder.Write("empty.apk", {});
+  const TempDir directory;
+  const std::string file = directory.Write("empty.apk", {});
 
   const Simulation run = Simulate(file, {"--trust", file});
 
@@ -229,8 +229,8 @@ TEST(OtherFile, ThatIsEmptyIsRefusedByEachStep) {
 
 // The end-of-central-directory record alone.
 TEST(OtherFile, ThatIsAnArchiveWithoutEntriesIsRefusedByEachStep) {
-  const TempDir folder;
-  const std::string file = folder.Write("empty.zip", BuildZip({}));
+  const TempDir directory;
+  const std::string file = directory.Write("empty.zip", BuildZip({}));
 
   const Simulation run = Simulate(file, {"--trust", file});
 
@@ -239,8 +239,8 @@ TEST(OtherFile, ThatIsAnArchiveWithoutEntriesIsRefusedByEachStep) {
 }
 
 TEST(OtherFile, WithTheAttributeButNoArchiveIsNotRegistered) {
-  const TempDir folder(PlaceForAttributes());
-  const std::string file = folder.Write("notes.txt", Bytes(1000, 'x'));
+  const TempDir directory(PlaceForAttributes());
+  const std::string file = directory.Write("notes.txt", Bytes(1000, 'x'));
   SetAttribute(file, "1");
 
   const Simulation run = Simulate(file, {"--trust", file});
@@ -260,13 +260,13 @@ std::string ZipRefusal(const std::string& path) {
 
 // No library opens one, and each has another code for it.
 TEST(OtherFile, ThatIsADirectoryIsRefusedByEachStep) {
-  const TempDir folder;
-  const std::string refusal = ZipRefusal(folder.path());
+  const TempDir directory;
+  const std::string refusal = ZipRefusal(directory.path());
   ASSERT_EQ(refusal[0], '-');
 
-  const Simulation run = Simulate(folder.path());
+  const Simulation run = Simulate(directory.path());
 
-  EXPECT_EQ(run.timeline, NotAnArchive(folder.path(), refusal));
+  EXPECT_EQ(run.timeline, NotAnArchive(directory.path(), refusal));
   EXPECT_EQ(run.status, 1);
 }
 

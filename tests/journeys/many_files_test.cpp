@@ -20,11 +20,11 @@ class ManyFiles : public testing::Test {
   ManyFiles() {
     const fs::path golden = GOLDEN_PACKAGES;
     for (const char* place : {"good", "shop", "shop/more"}) {
-      fs::create_directories(folder_ / place);
-      fs::copy(golden / "apksigner-sha256-2048/base.apk", folder_ / place);
+      fs::create_directories(directory_ / place);
+      fs::copy(golden / "apksigner-sha256-2048/base.apk", directory_ / place);
     }
-    fs::copy(golden / "unsigned.apk", folder_ / "shop");
-    folder_.Write("shop/notes.txt", ToBytes("notes"));
+    fs::copy(golden / "unsigned.apk", directory_ / "shop");
+    directory_.Write("shop/notes.txt", ToBytes("notes"));
   }
 
   // Runs it in the shell, where "sim" is the simulator.
@@ -34,7 +34,7 @@ class ManyFiles : public testing::Test {
         command.end(),
         {"env", "LC_ALL=C.UTF-8", "bash", "-c",
          "sim() { \"$SIM\" --installer=off --quiet \"$@\"; }\nSIM=$0\n" + script, SimulatorPath()});
-    return RunProcess(command, folder_.path());
+    return RunProcess(command, directory_.path());
   }
 
   // The verdicts without the signer, and the status; then what stands on standard error.
@@ -49,7 +49,7 @@ class ManyFiles : public testing::Test {
     return lines;
   }
 
-  const TempDir folder_;
+  const TempDir directory_;
 };
 
 constexpr char kOthers[] =
@@ -65,8 +65,9 @@ TEST_F(ManyFiles, RecursiveLooksAtThePackagesOfADirectory) {
 }
 
 TEST_F(ManyFiles, DirectoryWithoutRecursiveIsRefusedWithTheCure) {
-  const ProcessResult run = RunProcess(
-      {"env", "LC_ALL=C.UTF-8", SimulatorPath(), "--installer=off", "shop", "."}, folder_.path());
+  const ProcessResult run =
+      RunProcess({"env", "LC_ALL=C.UTF-8", SimulatorPath(), "--installer=off", "shop", "."},
+                 directory_.path());
   EXPECT_EQ(run.status, 1);
   EXPECT_NE(run.output.find("  ✗ file  not signed: it is a directory with 2 packages in it\n"
                             "      Name them all, a base and its splits: DIRECTORY/*.apk; or give\n"
@@ -80,10 +81,10 @@ TEST_F(ManyFiles, DirectoryWithoutRecursiveIsRefusedWithTheCure) {
 
 // The tool looked at nothing there, so the run must fail.
 TEST_F(ManyFiles, DirectoryWithoutPackagesIsNoSuccess) {
-  fs::create_directory(folder_ / "empty");
+  fs::create_directory(directory_ / "empty");
   ASSERT_EQ(Told(Do("sim --recursive good empty --journal journal")),
             Lines({"SIGNED  good/base.apk", "NOT LOOKED AT  empty", "-> 4"}));
-  const std::string journal = ContentOf(folder_ / "journal");
+  const std::string journal = ContentOf(directory_ / "journal");
   const size_t last = journal.rfind("{\"event\":\"verdict\"");
   const nlohmann::json verdict = nlohmann::json::parse(journal.substr(last));
   EXPECT_EQ(verdict["file"], "empty");
@@ -93,8 +94,8 @@ TEST_F(ManyFiles, DirectoryWithoutPackagesIsNoSuccess) {
 
 TEST_F(ManyFiles, DirectoryThatMayNotBeReadIsNoSuccess) {
   if (!CanMakeNamespaces()) GTEST_SKIP() << kNoNamespaces;
-  fs::create_directory(folder_ / "good/locked");
-  fs::permissions(folder_ / "good/locked", fs::perms::none);
+  fs::create_directory(directory_ / "good/locked");
+  fs::permissions(directory_ / "good/locked", fs::perms::none);
   EXPECT_EQ(Told(Do("sim --recursive good", {"unshare", "-U"})),
             Lines({"SIGNED  good/base.apk", "NOT LOOKED AT  good/locked", "-> 4"}));
 }
@@ -130,14 +131,15 @@ TEST_F(ManyFiles, TwoRunsOverTheSameFileTellTheSame) {
   const ProcessResult run =
       Do(both + "cmp 1.journal 2.journal && cmp 1.html 2.html && cmp 1.text 2.text");
   EXPECT_EQ(run.status, 0) << run.output << run.errors;
-  const std::string journal = ContentOf(folder_ / "1.journal");
-  EXPECT_NE(journal.find("{\"event\":\"start\",\"file\":\"good/base.apk\",\"path\":\"" +
-                         folder_.path() + "/good/base.apk\",\"installed\":\"<install>/base.apk\"}"),
-            std::string::npos)
+  const std::string journal = ContentOf(directory_ / "1.journal");
+  EXPECT_NE(
+      journal.find("{\"event\":\"start\",\"file\":\"good/base.apk\",\"path\":\"" +
+                   directory_.path() + "/good/base.apk\",\"installed\":\"<install>/base.apk\"}"),
+      std::string::npos)
       << journal;
   EXPECT_NE(journal.find("\"path\":\"<install>/lib/arm64/libvault.so\""), std::string::npos);
   for (const char* file : {"1.journal", "1.html", "1.text"}) {
-    const std::string content = ContentOf(folder_ / file);
+    const std::string content = ContentOf(directory_ / file);
     EXPECT_EQ(content.find("apktoolkit-sim."), std::string::npos) << file;
     EXPECT_NE(content.find("lib/arm64/libvault.so"), std::string::npos) << file;
   }
@@ -149,8 +151,8 @@ TEST_F(ManyFiles, NameThatLooksLikeAnInstallationIsTold) {
       Do("mkdir '<install>'; cp good/base.apk '<install>'/; sim --journal journal "
          "'<install>'/base.apk");
   EXPECT_EQ(Told(run), Lines({"SIGNED  <install>/base.apk", "-> 0"}));
-  EXPECT_NE(ContentOf(folder_ / "journal")
-                .find("\"path\":\"" + folder_.path() + "/<install>/base.apk\",\"installed\":"),
+  EXPECT_NE(ContentOf(directory_ / "journal")
+                .find("\"path\":\"" + directory_.path() + "/<install>/base.apk\",\"installed\":"),
             std::string::npos);
 }
 

@@ -26,9 +26,9 @@ class GoodPackageOn : public testing::Test {
                      Log(4, "ZuAddCertificate: ZuNewCertificate return 0.\n"), Exit(0)});
   }
 
-  const TempDir folder_;
-  const std::string apk_ = folder_ / "base.apk";
-  const std::string library_ = folder_.Write("lib/arm64/libfoo.so", ToBytes("\177ELF foo"));
+  const TempDir directory_;
+  const std::string apk_ = directory_ / "base.apk";
+  const std::string library_ = directory_.Write("lib/arm64/libfoo.so", ToBytes("\177ELF foo"));
 };
 
 // One refused signature: what leads up to the message (the kernel's part) differs.

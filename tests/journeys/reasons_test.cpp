@@ -57,19 +57,19 @@ Lines WithoutReason(size_t lines, Lines all) {
 // A copy of a golden package with its libraries beside it, for a test to spoil.
 class Reason : public testing::Test {
  protected:
-  // `name` is a folder of make_golden_packages, or a package in it.
+  // `name` is a directory of make_golden_packages, or a package in it.
   void Take(const std::string& name) {
     const fs::path source = fs::path(GOLDEN_PACKAGES) / name;
     if (fs::is_directory(source)) {
-      fs::copy(source, folder_.path(), fs::copy_options::recursive);
+      fs::copy(source, directory_.path(), fs::copy_options::recursive);
     } else {
-      fs::copy_file(source, folder_ / "base.apk");
+      fs::copy_file(source, directory_ / "base.apk");
     }
   }
 
-  // A shell command in the package's folder.
+  // A shell command in the package's directory.
   void Do(const std::string& command) const {
-    const ProcessResult run = RunProcess({"bash", "-e", "-c", command}, folder_.path());
+    const ProcessResult run = RunProcess({"bash", "-e", "-c", command}, directory_.path());
     ASSERT_EQ(run.status, 0) << run.errors;
   }
 
@@ -77,10 +77,10 @@ class Reason : public testing::Test {
              const Lines& before = {}) const {
     Lines words = options;
     words.push_back(file);
-    return WithoutReason(lines, FirstLines(kAll, words, {before, folder_.path()}));
+    return WithoutReason(lines, FirstLines(kAll, words, {before, directory_.path()}));
   }
 
-  const TempDir folder_;
+  const TempDir directory_;
 };
 
 TEST_F(Reason, Unsigned) {
@@ -104,8 +104,8 @@ TEST_F(Reason, NewerSchemeOnly) {
 
 TEST_F(Reason, SignedByJarsigner) {
   for (const char* name : {"jarsigner-sha256", "jarsigner-sha1"}) {
-    const std::string folder = std::string(GOLDEN_PACKAGES) + "/" + name;
-    const Lines told = WithoutReason(3, FirstLines(kAll, {"base.apk"}, {{}, folder}));
+    const std::string directory = std::string(GOLDEN_PACKAGES) + "/" + name;
+    const Lines told = WithoutReason(3, FirstLines(kAll, {"base.apk"}, {{}, directory}));
     EXPECT_EQ(told, Lines({"REFUSED  base.apk",
                            "  ✗ package                not signed: its signature covers signed "
                            "attributes, as jarsigner writes them, and this tool does not read "
@@ -204,9 +204,9 @@ TEST_F(Reason, SignatureOverALongerDigest) {
 TEST_F(Reason, ExponentOfOne) {
   Take("apksigner-sha256-2048");
   Do("unzip -q base.apk META-INF/CERT.SF");
-  const Bytes signature_file = ToBytes(ContentOf(folder_ / "META-INF/CERT.SF"));
+  const Bytes signature_file = ToBytes(ContentOf(directory_ / "META-INF/CERT.SF"));
   const auto refusal = [&](const Bytes& exponent) {
-    folder_.Write("META-INF/CERT.RSA", ForgedBlock(signature_file, "rsa-2048", exponent));
+    directory_.Write("META-INF/CERT.RSA", ForgedBlock(signature_file, "rsa-2048", exponent));
     Do("zip -q base.apk META-INF/CERT.RSA");
     return Told(3);
   };
@@ -220,14 +220,14 @@ TEST_F(Reason, ExponentOfOne) {
             "with which anyone can make its signatures");
 }
 
-TEST_F(Reason, Folder) {
+TEST_F(Reason, Directory) {
   EXPECT_EQ(Told(3, {}, "."),
             Lines({"REFUSED  .", "  ✗ file  not signed: it is a directory",
                    "      Name the package inside it, or give --recursive.", "-> 1"}));
 }
 
 TEST_F(Reason, EmptyFile) {
-  folder_.Write("base.apk", {});
+  directory_.Write("base.apk", {});
   EXPECT_EQ(Told(2), Lines({"REFUSED  base.apk",
                             "  ✗ file  not signed: it is empty, a file of 0 bytes", "-> 1"}));
 }
@@ -241,11 +241,11 @@ TEST_F(Reason, CutFile) {
                             "-> 1"}));
   // The zip library's own words are part of the timeline.
   EXPECT_EQ(Told(4)[3], "   1  log        [ziparchive] Zip: EOCD not found, " +
-                            (folder_ / "base.apk") + " is not zip");
+                            (directory_ / "base.apk") + " is not zip");
 }
 
 TEST_F(Reason, TextFile) {
-  folder_.Write("base.apk", ToBytes("<html>404 Not Found</html>\n"));
+  directory_.Write("base.apk", ToBytes("<html>404 Not Found</html>\n"));
   EXPECT_EQ(Told(2), Lines({"REFUSED  base.apk",
                             "  ✗ file  not signed: it is a text and not an archive", "-> 1"}));
 }
@@ -290,7 +290,7 @@ TEST_F(Reason, MissingFile) {
 TEST_F(Reason, NoPermission) {
   if (!CanMakeNamespaces()) GTEST_SKIP() << kNoNamespaces;
   Take("apksigner-sha256-2048");
-  fs::permissions(folder_ / "base.apk", fs::perms::none);
+  fs::permissions(directory_ / "base.apk", fs::perms::none);
   EXPECT_EQ(
       Told(2, {}, "base.apk", {"unshare", "-U"}),
       Lines({"NOT LOOKED AT  base.apk", "  ✗ file  not looked at: it may not be read", "-> 4"}));
@@ -301,7 +301,7 @@ TEST_F(Reason, ReadOnlyFileSystem) {
   Take("apksigner-sha256-2048");
   const TempDir mount_point;
   const std::string apk = mount_point / "base.apk";
-  const Lines before = OnItsOwnFileSystem(folder_ / "base.apk", mount_point.path(), "ro");
+  const Lines before = OnItsOwnFileSystem(directory_ / "base.apk", mount_point.path(), "ro");
   EXPECT_EQ(Told(2, {}, apk, before),
             Lines({"NOT LOOKED AT  " + apk,
                    "  ✗ file  not looked at: it lies on a read-only file system, where the tool "
@@ -442,7 +442,7 @@ TEST_F(Reason, ArchivesThatAreNoPackage) {
 
 TEST_F(Reason, LibraryInASubdirectoryOfItsAbi) {
   MakePackage(WithLibraries({{"lib/arm64-v8a/sub/libx.so", ToBytes("x")}}))
-      .WriteTo(folder_ / "base.apk");
+      .WriteTo(directory_ / "base.apk");
   EXPECT_EQ(Told(5)[2],
             "  – lib/arm64/sub/libx.so  nothing to sign: it is in a subdirectory of its ABI: the "
             "tool looks for lib/arm64/sub/libx.so, and installers do not put it there");
@@ -451,7 +451,7 @@ TEST_F(Reason, LibraryInASubdirectoryOfItsAbi) {
 TEST_F(Reason, KeyOf512BitsIsSignedWithAWarning) {
   PackageOptions options;
   options.block.key = "rsa-512";
-  MakePackage(options).WriteTo(folder_ / "base.apk");
+  MakePackage(options).WriteTo(directory_ / "base.apk");
   const Lines told = Told(kAll);
   EXPECT_EQ(told[0].rfind("SIGNED  base.apk   com.example.app   signer CN=Test, RSA-512, key ", 0),
             0U);
@@ -483,7 +483,7 @@ TEST_F(Reason, LibrariesOfAnotherProcessorAreNotLaidOut) {
 TEST_F(Reason, StrictRefusesALibraryThatNoInstallerTakes) {
   MakePackage(WithLibraries({{"lib/arm64-v8a/libx.so", ToBytes("x")},
                              {"lib/arm64-v8a/sub/liby.so", ToBytes("y")}}))
-      .WriteTo(folder_ / "base.apk");
+      .WriteTo(directory_ / "base.apk");
   EXPECT_EQ(Told(1, {"--install", "--strict"}).back(), "-> 1");
   EXPECT_EQ(Told(1, {"--install"}).back(), "-> 0");
 }
@@ -509,7 +509,7 @@ TEST_F(Reason, CertificateWithSha384IsCuredByTheCommandThatIsTold) {
      "/unsigned.apk --out base.apk;"
      "keytool -list -v -keystore key.p12 -storepass android >listed");
   EXPECT_EQ(Told(1)[0].substr(0, 16), "SIGNED  base.apk");
-  EXPECT_NE(ContentOf(folder_ / "listed").find("SHA256withRSA"), std::string::npos);
+  EXPECT_NE(ContentOf(directory_ / "listed").find("SHA256withRSA"), std::string::npos);
 }
 
 // The package alone, as a store delivers it.
@@ -539,7 +539,7 @@ TEST_F(Reason, PackageThatLiesAloneIsLaidOut) {
   Do("rm -r lib");
   const auto run = [this] {
     return RunProcess({"env", "LC_ALL=C.UTF-8", SimulatorPath(), "--installer=off", "base.apk"},
-                      folder_.path());
+                      directory_.path());
   };
   const ProcessResult alone = run();
   EXPECT_EQ(alone.status, 0);

@@ -77,9 +77,9 @@ class RefusedPackage : public testing::Test {
     EXPECT_EQ(run.status, status);
   }
 
-  const TempDir folder_;
-  const std::string apk_ = folder_ / "base.apk";
-  const std::string library_ = folder_.Write("lib/arm64/libfoo.so", kLibrary);
+  const TempDir directory_;
+  const std::string apk_ = directory_ / "base.apk";
+  const std::string library_ = directory_.Write("lib/arm64/libfoo.so", kLibrary);
   Package package_;
 };
 
@@ -265,7 +265,7 @@ TEST_F(IncompletePackage, OneRefusedLibraryDoesNotStopTheOther) {
     options.entries = {{"lib/arm64-v8a/libfoo.so", kLibrary}, {"lib/armeabi/libbar.so", kLibrary}};
     return options;
   }());
-  const std::string missing = folder_ / "lib/arm/libbar.so";
+  const std::string missing = directory_ / "lib/arm/libbar.so";
 
   const Simulation run = Run();
 

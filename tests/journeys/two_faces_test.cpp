@@ -116,20 +116,20 @@ struct Told {
   explicit Told(const Package& package, const std::vector<std::string>& options = {})
       : Told(package.Build(), options) {}
   explicit Told(const Bytes& archive, const std::vector<std::string>& options = {}) {
-    const TempDir folder;
-    WriteFile(folder / "base.apk", archive);
+    const TempDir directory;
+    WriteFile(directory / "base.apk", archive);
     const auto run = [&](std::vector<std::string> words) {
       words.insert(words.begin(),
                    {"env", "LC_ALL=C.UTF-8", SimulatorPath(), "--installer=off", "--install=no"});
       words.insert(words.end(), options.begin(), options.end());
       words.emplace_back("base.apk");
-      return RunProcess(words, folder.path());
+      return RunProcess(words, directory.path());
     };
     const ProcessResult quiet = run({"--quiet"});
     status = quiet.status;
     head = quiet.output;
     text = run({"--verbose", "--html", "page.html"}).output;
-    page = ContentOf(folder / "page.html");
+    page = ContentOf(directory / "page.html");
     std::istringstream lines(run({"--json"}).output);
     for (std::string line; std::getline(lines, line);) verdict = json::parse(line);
   }

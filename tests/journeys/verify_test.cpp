@@ -50,11 +50,11 @@ class SignedPackage : public testing::Test {
     EXPECT_EQ(Simulate(apk_, {"--state", state_}).status, 0);
   }
 
-  TempDir folder_;
-  const std::string apk_ = folder_ / "base.apk";
-  const std::string library_ = folder_.Write("lib/arm64/libfoo.so", ToBytes("\177ELF foo"));
-  const std::string other_ = folder_.Write("lib/arm64/libbar.so", ToBytes("\177ELF bar"));
-  const std::string state_ = folder_ / "state";
+  TempDir directory_;
+  const std::string apk_ = directory_ / "base.apk";
+  const std::string library_ = directory_.Write("lib/arm64/libfoo.so", ToBytes("\177ELF foo"));
+  const std::string other_ = directory_.Write("lib/arm64/libbar.so", ToBytes("\177ELF bar"));
+  const std::string state_ = directory_ / "state";
 };
 
 TEST_F(SignedPackage, IsTrustedWithItsLibrary) {
@@ -68,7 +68,7 @@ TEST_F(SignedPackage, IsTrustedAndWhatWasNotSignedIsNot) {
 }
 
 TEST_F(SignedPackage, IsNoLongerTrustedWhenAByteChanges) {
-  folder_.Write("lib/arm64/libfoo.so", ToBytes("\177ELF fop"));
+  directory_.Write("lib/arm64/libfoo.so", ToBytes("\177ELF fop"));
   ExpectAnswer(Verify({"--state", state_, apk_, library_}), 1,
                apk_ + ": trusted\n" + library_ + ": not trusted (errno 126, ENOKEY)\n");
 }
@@ -79,8 +79,8 @@ TEST_F(SignedPackage, IsNotTrustedByAnotherPhone) {
 }
 
 TEST(Verify, KernelGivesTheReason) {
-  const TempDir folder;
-  const std::string file = folder.Write("file", {});
+  const TempDir directory;
+  const std::string file = directory.Write("file", {});
   ExpectAnswer(Verify({"--verify-errno", "EKEYREVOKED", file}), 1,
                file + ": not trusted (errno 128, EKEYREVOKED)\n");
   ExpectAnswer(Verify({"--verify-errno", "EKEYREVOKED", "--trust", file, file}), 0,
@@ -89,8 +89,8 @@ TEST(Verify, KernelGivesTheReason) {
 
 // Asked once, and for nothing else: neither is the integrity value read nor anything signed.
 TEST(Verify, AsksForEachFileOnce) {
-  const TempDir folder;
-  const std::string file = folder.Write("file", {});
+  const TempDir directory;
+  const std::string file = directory.Write("file", {});
   const ProcessResult run = Verify({"--json", "--trust", file, file});
   std::istringstream lines(run.output);
   std::vector<std::string> events;
@@ -102,9 +102,9 @@ TEST(Verify, AsksForEachFileOnce) {
 }
 
 TEST(Verify, WhatCannotBeOpenedIsNotAsked) {
-  const TempDir folder;
-  const std::string missing = folder / "missing";
-  const std::string below = folder.Write("file", {}) + "/below";
+  const TempDir directory;
+  const std::string missing = directory / "missing";
+  const std::string below = directory.Write("file", {}) + "/below";
   ExpectAnswer(Verify({missing, below}), 1,
                missing + ": cannot be opened (errno 2, ENOENT)\n" + below +
                    ": cannot be opened (errno 20, ENOTDIR)\n");
@@ -112,8 +112,8 @@ TEST(Verify, WhatCannotBeOpenedIsNotAsked) {
 
 TEST(Verify, WhatMayNotBeReadCannotBeOpened) {
   if (!CanMakeNamespaces()) GTEST_SKIP() << kNoNamespaces;
-  const TempDir folder;
-  const std::string file = folder.Write("file", {});
+  const TempDir directory;
+  const std::string file = directory.Write("file", {});
   ASSERT_EQ(chmod(file.c_str(), 0), 0);
   ExpectAnswer(Call({"unshare", "-U", VerifyPath()}, {file}), 1,
                file + ": cannot be opened (errno 13, EACCES)\n");
@@ -121,19 +121,19 @@ TEST(Verify, WhatMayNotBeReadCannotBeOpened) {
 
 // A FIFO does not make the program wait. The kernel's answer for a FIFO or a device does not count.
 TEST(Verify, WhatIsNoRegularFileIsNotTrusted) {
-  const TempDir folder;
-  const std::string fifo = folder / "fifo";
+  const TempDir directory;
+  const std::string fifo = directory / "fifo";
   ASSERT_EQ(mkfifo(fifo.c_str(), 0600), 0);
-  ExpectAnswer(Verify({"--trust", fifo, "--trust", "/dev/null", fifo, "/dev/null", folder.path()}),
-               1,
-               fifo + ": not trusted (not a regular file)\n" +
-                   "/dev/null: not trusted (not a regular file)\n" + folder.path() +
-                   ": not trusted (not a regular file)\n");
+  ExpectAnswer(
+      Verify({"--trust", fifo, "--trust", "/dev/null", fifo, "/dev/null", directory.path()}), 1,
+      fifo + ": not trusted (not a regular file)\n" +
+          "/dev/null: not trusted (not a regular file)\n" + directory.path() +
+          ": not trusted (not a regular file)\n");
 }
 
 TEST(Verify, SocketCannotBeOpened) {
-  const TempDir folder;
-  const std::string path = folder / "socket";
+  const TempDir directory;
+  const std::string path = directory / "socket";
   sockaddr_un address = {};
   address.sun_family = AF_UNIX;
   path.copy(address.sun_path, sizeof(address.sun_path) - 1);
@@ -145,8 +145,8 @@ TEST(Verify, SocketCannotBeOpened) {
 
 // Its holder would be waited for.
 TEST(Verify, FileThatIsLeasedCannotBeOpened) {
-  const TempDir folder;
-  const std::string path = folder.Write("file", {});
+  const TempDir directory;
+  const std::string path = directory.Write("file", {});
   const int fd = open(path.c_str(), O_RDWR | O_CLOEXEC);
   signal(SIGIO, SIG_IGN);  // how the holder is told
   if (fcntl(fd, F_SETLEASE, F_WRLCK) != 0) GTEST_SKIP() << "the file system has no leases";
@@ -155,26 +155,27 @@ TEST(Verify, FileThatIsLeasedCannotBeOpened) {
 }
 
 TEST(Verify, LinkStandsForItsFile) {
-  const TempDir folder;
-  const std::string file = folder.Write("file", {});
-  const std::string link = folder / "link";
+  const TempDir directory;
+  const std::string file = directory.Write("file", {});
+  const std::string link = directory / "link";
   ASSERT_EQ(symlink("file", link.c_str()), 0);
   ExpectAnswer(Verify({"--trust", file, link}), 0, link + ": trusted\n");
 }
 
 TEST(Verify, EachFileHasOneLineWhateverItsName) {
-  const TempDir folder;
-  folder.Write("a\nb: trusted\t\x7f\\\x1b[2J", {});
-  folder.Write("gr\xc3\xbcn \xff", {});
-  ExpectAnswer(VerifyHere({"a\nb: trusted\t\x7f\\\x1b[2J", "gr\xc3\xbcn \xff"}, folder.path()), 1,
+  const TempDir directory;
+  directory.Write("a\nb: trusted\t\x7f\\\x1b[2J", {});
+  directory.Write("gr\xc3\xbcn \xff", {});
+  ExpectAnswer(VerifyHere({"a\nb: trusted\t\x7f\\\x1b[2J", "gr\xc3\xbcn \xff"}, directory.path()),
+               1,
                "a\\x0ab: trusted\\x09\\x7f\\x5c\\x1b[2J: not trusted (errno 22, EINVAL)\n"
                "gr\xc3\xbcn \xff: not trusted (errno 22, EINVAL)\n");
 }
 
 // EINVAL is what a kernel answers to a command of fcntl that it does not know.
 TEST(Verify, WithoutTheFeatureNothingIsTrusted) {
-  const TempDir folder;
-  const std::string file = folder.Write("file", {});
+  const TempDir directory;
+  const std::string file = directory.Write("file", {});
   ExpectAnswer(VerifyHere({file}), 1, file + ": not trusted (errno 22, EINVAL)\n");
 }
 
@@ -187,15 +188,16 @@ TEST(VerifyUsage, IsShownWithoutAFileAndForWhatLooksLikeAnOption) {
     EXPECT_EQ(run.errors, usage);
     EXPECT_EQ(run.output, "");
   }
-  const TempDir folder;
-  folder.Write("-x", {});
-  EXPECT_EQ(VerifyHere({"./-x"}, folder.path()).output, "./-x: not trusted (errno 22, EINVAL)\n");
+  const TempDir directory;
+  directory.Write("-x", {});
+  EXPECT_EQ(VerifyHere({"./-x"}, directory.path()).output,
+            "./-x: not trusted (errno 22, EINVAL)\n");
 }
 
 // "All are trusted" has to reach somebody.
 TEST(VerifyOutput, ThatCannotBeWrittenIsAFailure) {
-  const TempDir folder;
-  const std::string file = folder.Write("file", {});
+  const TempDir directory;
+  const std::string file = directory.Write("file", {});
   const Words trusting = {SimulatorPath(), "--verify", "--trust", file, file};
   for (const char* stream : {"exec \"$@\" >/dev/full", "exec \"$@\" >&-"}) {
     EXPECT_EQ(Call({"sh", "-c", stream, "sh", VerifyPath()}, {file}).status, 2) << stream;

@@ -1,7 +1,7 @@
 #!/usr/bin/env python3
 """Reads the JUnit reports and SARIF logs of real runs, of odd names as well.
 
-Arguments: the folder of the golden packages, and the words that start apktoolkit-sim.
+Arguments: the directory of the golden packages, and the words that start apktoolkit-sim.
 
 The reader of JUnit reports is junitparser. A SARIF log is held against SARIF below: of the standard
 (OASIS, SARIF 2.1.0) it has the objects and properties that the simulator writes, each with the
@@ -62,9 +62,9 @@ SARIF = record(["version", "runs"], **{"$schema": URI}, version={"enum": ["2.1.0
                runs=listing(RUN))
 
 
-def run(simulator, folder, options, files):
+def run(simulator, directory, options, files):
     """The verdict events, the JUnit suites and the SARIF log of one run."""
-    junit, sarif = folder / "junit.xml", folder / "log.sarif"
+    junit, sarif = directory / "junit.xml", directory / "log.sarif"
     journal = subprocess.run([*simulator, "--json", "--junit", junit, "--sarif", sarif, *options, *files],
                              capture_output=True, check=False).stdout
     events = [json.loads(line) for line in journal.splitlines()]
@@ -115,11 +115,11 @@ def sarif_problems(verdicts, log):
     return problems
 
 
-def odd_files(package, folder):
+def odd_files(package, directory):
     """Copies of a package under names with everything in them that XML, JSON and URIs give a meaning."""
     for name in (b"a b&<>\"'.apk", b"]]>.apk", b"http:x?a#b%41.apk", b"line\nend\x01.apk", b"\xe9\xff.apk",
                  "\u202egr\u00fcn\ufffe\U0001f600.apk".encode()):
-        path = folder / name.decode(errors="surrogateescape")
+        path = directory / name.decode(errors="surrogateescape")
         shutil.copy(package, path)
         yield path
 
@@ -129,17 +129,17 @@ def main():
     packages = sorted(pathlib.Path(golden).glob("*/base.apk"))
     problems = []
     with tempfile.TemporaryDirectory() as name:
-        folder = pathlib.Path(name)
-        jar = folder / "library.jar"
+        directory = pathlib.Path(name)
+        jar = directory / "library.jar"
         with zipfile.ZipFile(jar, "w") as archive:
             archive.writestr("a.txt", "a")
         package = pathlib.Path(golden) / "apksigner-sha256-2048/base.apk"
-        odd = list(odd_files(package, folder))
-        files = [*packages, *odd, jar, folder / "absent.apk", folder, package, package]
+        odd = list(odd_files(package, directory))
+        files = [*packages, *odd, jar, directory / "absent.apk", directory, package, package]
         seen = set()
         for options, some in ([], files), (["--werror", "--signer", "0" * 64], files), \
                 (["--integrity", "ffffffff", "--timeout", "0.5"], [package]), ([], [package]):
-            verdicts, suites, log = run(simulator, folder, options, some)
+            verdicts, suites, log = run(simulator, directory, options, some)
             if len(verdicts) != len(some):
                 problems.append(f"{len(some)} files, {len(verdicts)} verdicts")
             problems += junit_problems(verdicts, suites) + sarif_problems(verdicts, log)

@@ -50,8 +50,8 @@ TEST(ExitStatus, FourForAFileThatIsNotThere) {
 }
 
 TEST(ExitStatus, FourWhenStandardInputIsClosed) {
-  const TempDir folder;
-  const std::string file = folder.Write("note.txt", ToBytes("hello\n"));
+  const TempDir directory;
+  const std::string file = directory.Write("note.txt", ToBytes("hello\n"));
   const ProcessResult result =
       RunProcess({"bash", "-c", "exec \"$@\" <&-", "bash", SimulatorPath(), file});
   EXPECT_EQ(result.status, 4);
@@ -84,8 +84,8 @@ TEST(ExitStatus, ThreeWhenTheVerifierDoesNotEnd) {
 
 // Reading a pipe waits for a writer, and a device has no end. Neither is read to remember it.
 TEST(ExitStatus, OneForADeviceOrAPipe) {
-  const TempDir folder;
-  const std::string pipe = folder / "pipe";
+  const TempDir directory;
+  const std::string pipe = directory / "pipe";
   ASSERT_EQ(mkfifo(pipe.c_str(), 0600), 0);
   const TempDir state;
   state.Write("name", ToBytes("x"));
@@ -134,8 +134,8 @@ TEST(ExitStatus, ThreeWhenThereIsNoTool) {
 
 TEST(ExitStatus, ThreeWhenTheToolIsNoProgram) {
   if (AreProgramsEmulated()) GTEST_SKIP() << "the emulator starts, and not the tool";
-  const TempDir folder;
-  const std::string tool = folder.Write("tool", ToBytes("\177ELF"));
+  const TempDir directory;
+  const std::string tool = directory.Write("tool", ToBytes("\177ELF"));
   ASSERT_EQ(chmod(tool.c_str(), 0755), 0);
   const ProcessResult result = RunProcess({SimulatorPath(), "--tool", tool, "/"});
   EXPECT_EQ(result.status, 3);
@@ -144,9 +144,10 @@ TEST(ExitStatus, ThreeWhenTheToolIsNoProgram) {
 
 TEST(ExitStatus, ThreeWhenTheStandInsAreNotInTheTool) {
   if (AreProgramsEmulated()) GTEST_SKIP() << "the emulator hides that a program does not start";
-  const TempDir folder;
+  const TempDir directory;
   // The settings for the loader are lost on the way.
-  const std::string tool = folder.Write("tool", ToBytes("#!/usr/bin/env -S -u LD_PRELOAD true\n"));
+  const std::string tool =
+      directory.Write("tool", ToBytes("#!/usr/bin/env -S -u LD_PRELOAD true\n"));
   ASSERT_EQ(chmod(tool.c_str(), 0755), 0);
   const ProcessResult result =
       RunProcess({SimulatorPath(), "--runner", "/nowhere/emulator", "--tool", tool, "/"});
@@ -193,7 +194,7 @@ TEST(ExitStatus, ThreeWhenThePageCannotBeWritten) {
 // Nobody reads the pipe; with a reader, one that comes a little late, all is well.
 TEST(ExitStatus, ThreeWhenThePageIsAPipeThatNobodyReads) {
   const Probe probe({"sign 3 0100ab"});
-  const std::string pipe = probe.folder() / "page";
+  const std::string pipe = probe.directory() / "page";
   ASSERT_EQ(mkfifo(pipe.c_str(), 0600), 0);
   const ProcessResult unread = Simulated({"--html", pipe, probe.path()});
   EXPECT_EQ(unread.status, 3);
@@ -208,8 +209,8 @@ TEST(ExitStatus, ThreeWhenThePageIsAPipeThatNobodyReads) {
 // The fault lies in the file system and not in the package, so the run says nothing about the
 // package.
 TEST(ExitStatus, ThreeWhenLibrariesCannotBeWritten) {
-  const TempDir folder;
-  const std::string file = folder / "base.apk";
+  const TempDir directory;
+  const std::string file = directory / "base.apk";
   MakePackage(WithLibraries({{"lib/arm64-v8a/liba.so", Bytes(3000, 'a')}})).WriteTo(file);
   const ProcessResult result =
       RunProcess({"bash", "-c", "trap '' XFSZ; ulimit -f 1; exec \"$@\"", "bash", "env",
@@ -225,8 +226,8 @@ TEST(ExitStatus, ThreeWhenLibrariesCannotBeWritten) {
 TEST(ExitStatus, OneWhenALibraryCannotBeExtracted) {
   Package package = MakePackage();
   package.Item("lib/arm64-v8a/libfoo.so").method = 12;
-  const TempDir folder;
-  const std::string file = folder / "lib";
+  const TempDir directory;
+  const std::string file = directory / "lib";
   package.WriteTo(file);
   const ProcessResult quiet = Told({"--quiet", "--install", file});
   EXPECT_EQ(quiet.status, 1);
@@ -256,7 +257,7 @@ TEST(ExitStatus, TwoWhenTheJournalWouldReplaceAFile) {
 
 TEST(ExitStatus, TwoWhenThePageWouldReplaceAFile) {
   const Probe probe({"sign 3 0000"});
-  const std::string notes = probe.folder().Write("notes.html", ToBytes("<!DOCTYPE html>\n<p>"));
+  const std::string notes = probe.directory().Write("notes.html", ToBytes("<!DOCTYPE html>\n<p>"));
   for (const std::string& victim : {probe.path(), notes}) {
     const std::string before = ContentOf(victim);
     const ProcessResult result = Simulated({"--html", victim, probe.path()});
@@ -271,12 +272,12 @@ TEST(ExitStatus, TwoWhenThePageWouldReplaceAFile) {
 }
 
 TEST(ExitStatus, TwoWhenATrustedFileOrTheToolWouldBeReplaced) {
-  const TempDir folder;
+  const TempDir directory;
   const Probe probe({"sign 3 0000"});
   // Each begins as the output does, so that nothing but its use speaks for it.
-  const std::string journal = folder.Write("journal", ToBytes("{\"event\":\"journal\"}\n"));
+  const std::string journal = directory.Write("journal", ToBytes("{\"event\":\"journal\"}\n"));
   const std::string page =
-      folder.Write("page", ToBytes("<!DOCTYPE html>\n<!-- A page of apktoolkit-sim -->\n"));
+      directory.Write("page", ToBytes("<!DOCTYPE html>\n<!-- A page of apktoolkit-sim -->\n"));
   const auto errors = [&](const Lines& words) {
     const ProcessResult result = Told(words);
     EXPECT_EQ(result.status, 2);
@@ -293,7 +294,7 @@ TEST(ExitStatus, TwoWhenATrustedFileOrTheToolWouldBeReplaced) {
 
 TEST(ExitStatus, TwoWhenPageAndJournalAreOneFile) {
   const Probe probe({"sign 3 0000"});
-  const std::string file = probe.folder() / "file";
+  const std::string file = probe.directory() / "file";
   const ProcessResult result = Simulated({"--html", file, "--journal", file, probe.path()});
   EXPECT_EQ(result.status, 2);
   EXPECT_EQ(result.errors, "apktoolkit-sim: --journal and --html name the same file\n");
@@ -302,7 +303,8 @@ TEST(ExitStatus, TwoWhenPageAndJournalAreOneFile) {
 
 TEST(ExitStatus, TwoWhenAReportWouldReplaceAFile) {
   const Probe probe({"sign 3 0000"});
-  const std::string other = probe.folder().Write("other", ToBytes("<?xml version=\"1.0\"?>\n{}"));
+  const std::string other =
+      probe.directory().Write("other", ToBytes("<?xml version=\"1.0\"?>\n{}"));
   const std::vector<Lines> kReports = {{"--junit", "JUnit report"}, {"--sarif", "SARIF log"}};
   for (const Lines& report : kReports) {
     for (const std::string& victim : {probe.path(), other}) {
@@ -322,7 +324,7 @@ TEST(ExitStatus, TwoWhenAReportWouldReplaceAFile) {
 
 TEST(ExitStatus, TwoWhenTwoOutputsAreOneFile) {
   const Probe probe({"sign 3 0000"});
-  const std::string file = probe.folder() / "file";
+  const std::string file = probe.directory() / "file";
   const Lines options = {"--journal", "--html", "--junit", "--sarif"};
   for (size_t i = 0; i < options.size(); ++i) {
     for (size_t j = i + 1; j < options.size(); ++j) {

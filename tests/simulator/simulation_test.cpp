@@ -42,8 +42,8 @@ TEST(Files, KeepTheirOrderWhenSeveralRunAtATime) {
   const Probe slow({"sign 3 0000", "sleep 1"});
   const Probe quick({"verify 3"});
   const Lines files = {slow.path(), quick.path(), quick.path(), quick.path()};
-  const TempDir folder;
-  const std::string journal = folder / "journal";
+  const TempDir directory;
+  const std::string journal = directory / "journal";
   Lines words = {"--jobs", "4", "--quiet", "--journal", journal};
   words.insert(words.end(), files.begin(), files.end());
   const ProcessResult result = Simulated(words);
@@ -103,8 +103,8 @@ TEST(Files, HaveNoColoursWhereTheUserWantsNone) {
 // gives the signal by which it ended (0 if by none) and the seconds that this took.
 struct Interrupted {
   Interrupted(const std::string& pattern, const Lines& words, int signal = SIGTERM) {
-    const TempDir folder;
-    const std::string out = folder / "out";
+    const TempDir directory;
+    const std::string out = directory / "out";
     Lines command = {"python3", "-c", R"(
 import glob, os, signal, subprocess, sys, time
 out, pattern, number, command = sys.argv[1], sys.argv[2], int(sys.argv[3]), sys.argv[4:]
@@ -149,9 +149,19 @@ TEST(Interruption, ByAReaderThatEndsLeavesNothingBehind) {
   large.entries.push_back({"lib/arm64-v8a/liba.so", Bytes(8 << 20, 'a')});
   MakePackage().WriteTo(directory / "small.apk");
   MakePackage(large).WriteTo(directory / "large.apk");
-  Lines words = {"bash", "-c", "\"$@\" | head -c 1; echo \" ${PIPESTATUS[0]}\"", "bash", "env",
-                 "TMPDIR=" + temporary.path(), SimulatorPath(), "--quiet", "--installer=off",
-                 "--install", "--jobs", "8", directory / "small.apk"};
+  Lines words = {"bash",
+                 "-c",
+                 "\"$@\" | head -c 1; echo \" ${PIPESTATUS[0]}\"",
+                 "bash",
+                 "env",
+                 "TMPDIR=" + temporary.path(),
+                 SimulatorPath(),
+                 "--quiet",
+                 "--installer=off",
+                 "--install",
+                 "--jobs",
+                 "8",
+                 directory / "small.apk"};
   words.insert(words.end(), 7, directory / "large.apk");
   const ProcessResult result = RunProcess(words);
   EXPECT_EQ(result.output, "S " + std::to_string(128 + SIGPIPE) + "\n");
@@ -172,8 +182,8 @@ TEST(Interruption, IsNoneByASignalThatTheCallerIgnores) {
 
 // The author of a file chooses the names in it.
 TEST(Files, NamesReachNoTerminalAsTheyAre) {
-  const TempDir folder;
-  const std::string odd = folder.Write("-\x1b]0;x\x07", ToBytes("sign 3 0000\n"));
+  const TempDir directory;
+  const std::string odd = directory.Write("-\x1b]0;x\x07", ToBytes("sign 3 0000\n"));
   for (const Lines& words :
        {Lines({odd}), Lines({"-\x1b]0;x\x07"}), Lines({"--journal", odd, odd})}) {
     const ProcessResult result = Simulated(words);
@@ -183,10 +193,10 @@ TEST(Files, NamesReachNoTerminalAsTheyAre) {
 }
 
 TEST(Journal, StartsWithTheVersionTheFileAndTheProcess) {
-  const TempDir folder;
-  const std::string file = folder.Write("script", ToBytes("sign 3 0000\n"));
+  const TempDir directory;
+  const std::string file = directory.Write("script", ToBytes("sign 3 0000\n"));
   const ProcessResult result =
-      RunProcess({SimulatorPath(), "--json", "--tool", PROBE_PATH, "./script"}, folder.path());
+      RunProcess({SimulatorPath(), "--json", "--tool", PROBE_PATH, "./script"}, directory.path());
   std::vector<Json> events = ParseJournal(result.output);
   ASSERT_EQ(events.size(), 6U);
   EXPECT_EQ(LinesOf(result.output)[0], "{\"event\":\"journal\",\"version\":1}");
@@ -200,7 +210,7 @@ TEST(Journal, StartsWithTheVersionTheFileAndTheProcess) {
 TEST(Journal, IsKeptInAFileAnew) {
   const Probe probe({"sign 3 0000"});
   const std::string before = "{\"event\":\"journal\",\"version\":1}\n{\"event\":\"old\"}\n";
-  const std::string file = probe.folder().Write("journal", ToBytes(before));
+  const std::string file = probe.directory().Write("journal", ToBytes(before));
   const ProcessResult kept = Simulated({"--journal", file, probe.path()});
   EXPECT_EQ(LinesOf(kept.output)[0], "TRUSTED JAR  " + probe.path());
   const ProcessResult both = Simulated({"--json", "--journal", file, probe.path()});
@@ -209,19 +219,19 @@ TEST(Journal, IsKeptInAFileAnew) {
 }
 
 TEST(Journal, FileNamesAreBytes) {
-  const TempDir folder;
-  const std::string odd = folder.Write("od\xe9\n\"d", ToBytes("sign 3 0000\n"));
+  const TempDir directory;
+  const std::string odd = directory.Write("od\xe9\n\"d", ToBytes("sign 3 0000\n"));
   const ProcessResult result = Simulated({"--json", odd});
   EXPECT_EQ(result.status, 0);
   const std::vector<Json> events = ParseJournal(result.output);
   ASSERT_EQ(events.size(), 6U);
-  EXPECT_EQ(events[3]["path"], folder / "od\uf7e9\n\"d");
+  EXPECT_EQ(events[3]["path"], directory / "od\uf7e9\n\"d");
 }
 
 TEST(Page, IsWrittenAnewForAllFilesInTheirOrder) {
   const Probe good({"sign 3 0000", "sleep 1"});
   const Probe bad({"verify 3"});
-  const std::string page = good.folder() / "page.html";
+  const std::string page = good.directory() / "page.html";
   ASSERT_EQ(Simulated({"--html", page, bad.path()}).status, 1);
   const ProcessResult result =
       Simulated({"--html", page, "--quiet", "--jobs", "3", good.path(), bad.path(), good.path()});
@@ -236,8 +246,8 @@ TEST(Page, IsWrittenAnewForAllFilesInTheirOrder) {
 
 // A journal does not deceive a person who looks at it.
 TEST(Journal, HasNoHiddenCharacters) {
-  const TempDir folder;
-  const std::string odd = folder.Write("\u0085\u202e\u200b", ToBytes("sign 3 0000\n"));
+  const TempDir directory;
+  const std::string odd = directory.Write("\u0085\u202e\u200b", ToBytes("sign 3 0000\n"));
   const ProcessResult result = Simulated({"--json", odd});
   for (const char* hidden : {"\u0085", "\u202e", "\u200b"}) {
     EXPECT_EQ(result.output.find(hidden), std::string::npos) << result.output;
@@ -248,7 +258,7 @@ TEST(Journal, HasNoHiddenCharacters) {
 TEST(Page, OfAnInterruptedRunHasWhatWasDone) {
   const Probe good({"sign 3 0000"});
   const Probe slow({"sign 3 0000", "pid", "sleep 60"});
-  const std::string page = good.folder() / "page.html";
+  const std::string page = good.directory() / "page.html";
   const Interrupted run(slow.path() + ".pid", {SimulatorPath(), "--tool", PROBE_PATH, "--html",
                                                page, good.path(), slow.path(), good.path()});
   EXPECT_EQ(run.ended_by, SIGTERM);
@@ -266,7 +276,7 @@ TEST(Page, OfAnInterruptedRunHasWhatWasDone) {
 TEST(Reports, OfAnInterruptedRunAreWholeAndNotGreen) {
   const Probe good({"sign 3 0000"});
   const Probe slow({"sign 3 0000", "pid", "sleep 60"});
-  const std::string junit = good.folder() / "junit.xml", sarif = good.folder() / "log.sarif";
+  const std::string junit = good.directory() / "junit.xml", sarif = good.directory() / "log.sarif";
   const Interrupted run(slow.path() + ".pid",
                         {SimulatorPath(), "--tool", PROBE_PATH, "--junit", junit, "--sarif", sarif,
                          good.path(), slow.path(), "/never/1", "/never/2"});
@@ -293,7 +303,7 @@ TEST(Reports, OfAnInterruptedRunAreWholeAndNotGreen) {
 // An earlier green report must not outlive a run that could not begin.
 TEST(Reports, OfARunThatCannotBeginAreNotGreen) {
   const Probe good({"sign 3 0000"});
-  const std::string junit = good.folder() / "junit.xml", sarif = good.folder() / "log.sarif";
+  const std::string junit = good.directory() / "junit.xml", sarif = good.directory() / "log.sarif";
   const Lines reports = {"--junit", junit, "--sarif", sarif, good.path()};
   ASSERT_EQ(Simulated(reports).status, 0);
   EXPECT_NE(ContentOf(junit).find("failures=\"0\" errors=\"0\""), std::string::npos);
@@ -314,16 +324,16 @@ TEST(Reports, OfARunThatCannotBeginAreNotGreen) {
 
 TEST(Simulation, FollowsLinksToTheFile) {
   const Probe probe({"sign 3 0000"});
-  const std::string link = probe.folder() / "link";
+  const std::string link = probe.directory() / "link";
   ASSERT_EQ(symlink("script", link.c_str()), 0);
   EXPECT_EQ(Simulated({link}).status, 0);
 }
 
-TEST(Simulation, WorksFromAFolderThatTheLoaderCannotName) {
+TEST(Simulation, WorksFromADirectoryThatTheLoaderCannotName) {
   if (AreProgramsEmulated()) GTEST_SKIP() << "the copies cannot be started by themselves";
   namespace fs = std::filesystem;
-  const TempDir folder;
-  const std::string place = folder / "with space: and colon";
+  const TempDir directory;
+  const std::string place = directory / "with space: and colon";
   const fs::path built = fs::path(SimulatorPath()).parent_path().parent_path();
   fs::create_directories(place + "/bin");
   fs::create_directories(place + "/lib");
@@ -341,33 +351,33 @@ TEST(Simulation, WorksFromAFolderThatTheLoaderCannotName) {
 }
 
 // A runner that does something to the file first.
-std::string RunnerThat(const std::string& does, const TempDir& folder) {
+std::string RunnerThat(const std::string& does, const TempDir& directory) {
   const std::string runner =
-      folder.Write("runner", ToBytes("#!/bin/sh\n" + does + "\nshift\nexec env \"$@\"\n"));
+      directory.Write("runner", ToBytes("#!/bin/sh\n" + does + "\nshift\nexec env \"$@\"\n"));
   EXPECT_EQ(chmod(runner.c_str(), 0755), 0);
   return runner;
 }
 
 TEST(Simulation, TellsThatTheFileWasChangedMeanwhile) {
   if (AreProgramsEmulated()) GTEST_SKIP() << "there is a runner already";
-  const TempDir folder;
-  const std::string file = folder / "base.apk";
+  const TempDir directory;
+  const std::string file = directory / "base.apk";
   MakePackage().WriteTo(file);
-  const std::string runner = RunnerThat("touch " + file, folder);
+  const std::string runner = RunnerThat("touch " + file, directory);
   const std::string changed = "   ! it was changed during the run";
   EXPECT_NE(Told({"--quiet", "--runner", runner, file}).output.find(changed), std::string::npos);
   EXPECT_EQ(Told({"--quiet", file}).output.find(changed), std::string::npos);
   // A file that the tool could not open does not count as changed.
-  EXPECT_EQ(Told({"--quiet", folder.path()}).output.find(changed), std::string::npos);
+  EXPECT_EQ(Told({"--quiet", directory.path()}).output.find(changed), std::string::npos);
 }
 
 // The directory is mapped by the tool and by the simulator, and is cut off again and again.
 TEST(Simulation, SurvivesAFileThatShrinksAndGoesOnToTheNext) {
   PackageOptions options;
   for (int i = 0; i < 20000; ++i) options.entries.push_back({"assets/" + std::to_string(i), {}});
-  const TempDir folder;
-  MakePackage(options).WriteTo(folder / "whole.apk");
-  MakePackage().WriteTo(folder / "good.apk");
+  const TempDir directory;
+  MakePackage(options).WriteTo(directory / "whole.apk");
+  MakePackage().WriteTo(directory / "good.apk");
   const std::string script =
       // AddressSanitizer takes the signal for an error of the tool's.
       "export ASAN_OPTIONS=\"$ASAN_OPTIONS:handle_sigbus=0\"\n"
@@ -378,7 +388,7 @@ TEST(Simulation, SurvivesAFileThatShrinksAndGoesOnToTheNext) {
       "  [ $status = 1 ] || [ $status = 0 ] || echo \"status $status\"\n"
       "  grep -q '^SIGNED  good.apk' out || cat out\ndone; touch end; wait $loop";
   const ProcessResult result =
-      RunProcess({"bash", "-c", script, "bash", folder.path(), SimulatorPath()});
+      RunProcess({"bash", "-c", script, "bash", directory.path(), SimulatorPath()});
   EXPECT_EQ(result.output, "");
 }
 
@@ -387,10 +397,10 @@ TEST(Simulation, RunnerGetsThePreloadForTheTool) {
   const Probe probe({"sign 3 0000"});
   // Does what an emulator does with -E, and tells what it was given itself.
   const std::string runner =
-      probe.folder().Write("runner", ToBytes("#!/bin/sh\n"
-                                             "echo \"$1 $2 ${3%%=*} preload=$LD_PRELOAD\" >&2\n"
-                                             "shift 2\n"
-                                             "exec env \"$@\"\n"));
+      probe.directory().Write("runner", ToBytes("#!/bin/sh\n"
+                                                "echo \"$1 $2 ${3%%=*} preload=$LD_PRELOAD\" >&2\n"
+                                                "shift 2\n"
+                                                "exec env \"$@\"\n"));
   ASSERT_EQ(chmod(runner.c_str(), 0755), 0);
   const ProcessResult result = Simulated({"--runner", runner + " --flag", probe.path()});
   EXPECT_EQ(result.errors, "--flag -E LD_PRELOAD preload=\n");
@@ -415,7 +425,7 @@ TEST(State, WhatWasSignedStaysTrustedWhileItsBytesStayTheSame) {
   EXPECT_EQ(jar.Run({"--state", state.path()}).status, 1);
   EXPECT_EQ(jar.Run({"--state", state.path()}).status, 0);
   // One byte changed.
-  jar.folder().Write("script", ToBytes("verify 3\nsign 3 0001\n"));
+  jar.directory().Write("script", ToBytes("verify 3\nsign 3 0001\n"));
   EXPECT_EQ(jar.Run({"--state", state.path()}).results[0], "-1 126");
 }
 
@@ -446,8 +456,8 @@ TEST(State, IsNotSharedWhenSeveralFilesRunAtATime) {
 }
 
 TEST(Tool, RunsAsItIsOnAFileThatIsNoZip) {
-  const TempDir folder;
-  const std::string file = folder.Write("note.txt", ToBytes("hello\n"));
+  const TempDir directory;
+  const std::string file = directory.Write("note.txt", ToBytes("hello\n"));
   const ProcessResult result = Told({file});
   EXPECT_EQ(result.status, 1);
   EXPECT_EQ(result.errors, "");

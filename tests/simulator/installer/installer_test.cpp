@@ -19,16 +19,16 @@ namespace {
 class FakeJava {
  public:
   explicit FakeJava(const std::string& script) : path_(getenv("PATH")) {
-    const std::string java = folder_.Write("java", ToBytes("#!/bin/bash\n" + script));
+    const std::string java = directory_.Write("java", ToBytes("#!/bin/bash\n" + script));
     chmod(java.c_str(), 0755);
-    setenv("PATH", (folder_.path() + ":" + path_).c_str(), 1);
+    setenv("PATH", (directory_.path() + ":" + path_).c_str(), 1);
   }
   ~FakeJava() { setenv("PATH", path_.c_str(), 1); }
 
-  std::string operator/(const std::string& name) const { return folder_ / name; }
+  std::string operator/(const std::string& name) const { return directory_ / name; }
 
  private:
-  const TempDir folder_;
+  const TempDir directory_;
   const std::string path_;
 };
 

@@ -133,8 +133,8 @@ TEST(Archive, EntryThatClaimsTooMuchIsDamaged) {
 TEST(Archive, SurvivesAFileThatShrinks) {
   std::vector<ZipItem> items;
   for (int i = 0; i < 2000; ++i) items.push_back({"assets/" + std::to_string(i), {}});
-  const TempDir folder;
-  const std::string path = folder.Write("a.zip", BuildZip(items));
+  const TempDir directory;
+  const std::string path = directory.Write("a.zip", BuildZip(items));
   const int fd = open(path.c_str(), O_RDONLY);
   int32_t result = -1;
   {

@@ -211,7 +211,7 @@ TEST(NameText, IsWhatTheJdkWrites) {
       der::Sequence(
           {der::Set({der::Sequence({der::Oid("2.5.4.3"), der::Element(0x14, "caf\xe9")})})}),
   };
-  const TempDir folder;
+  const TempDir directory;
   std::string command =
       "cd \"$0\"; for i in *; do LC_ALL=C.UTF-8 keytool -J-Dfile.encoding=UTF-8 "
       "-J-Dstdout.encoding=UTF-8 -printcert -file $i | sed -n 's/^Owner: //p'; "
@@ -220,10 +220,10 @@ TEST(NameText, IsWhatTheJdkWrites) {
   for (size_t i = 0; i < names.size(); ++i) {
     Certificate certificate;
     certificate.subject = names[i];
-    folder.Write(std::to_string(i), certificate.Build());
+    directory.Write(std::to_string(i), certificate.Build());
     const auto facts = ParseCertificate(View(certificate.Build()));
     ASSERT_TRUE(facts.has_value()) << i;
     expected += facts->subject + "\n";
   }
-  EXPECT_EQ(RunProcess({"bash", "-c", command, folder.path()}).output, expected);
+  EXPECT_EQ(RunProcess({"bash", "-c", command, directory.path()}).output, expected);
 }

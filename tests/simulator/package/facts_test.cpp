@@ -45,18 +45,18 @@ TEST(PackageFacts, HaveTheDigestOfTheFile) {
 
 // mknod makes a socket of it that nobody listens at.
 TEST(FileKind, OfWhatCannotBeOpenedIsNotTold) {
-  const TempDir folder;
-  const std::string socket = folder / "socket";
+  const TempDir directory;
+  const std::string socket = directory / "socket";
   ASSERT_EQ(mknod(socket.c_str(), S_IFSOCK | 0600, 0), 0);
   EXPECT_EQ(LookAt(socket).error, ENXIO);
-  EXPECT_EQ(LookAt(folder / "none").error, ENOENT);
+  EXPECT_EQ(LookAt(directory / "none").error, ENOENT);
 }
 
 TEST(FileKind, IsToldByWhatTheFileIs) {
-  const TempDir folder;
-  const std::string pipe = folder / "pipe";
+  const TempDir directory;
+  const std::string pipe = directory / "pipe";
   ASSERT_EQ(mkfifo(pipe.c_str(), 0600), 0);
-  EXPECT_EQ(LookAt(folder.path()).kind, FileKind::kDirectory);
+  EXPECT_EQ(LookAt(directory.path()).kind, FileKind::kDirectory);
   EXPECT_EQ(LookAt(pipe).kind, FileKind::kSpecial);
   EXPECT_EQ(LookAt("/dev/zero").kind, FileKind::kSpecial);
   EXPECT_EQ(FactsOf({}).kind, FileKind::kEmpty);
@@ -255,10 +255,10 @@ TEST(PackageFacts, FileThatShrinksMeanwhileWasChanged) {
   PackageOptions options;
   for (int i = 0; i < 20000; ++i) options.entries.push_back({"assets/" + std::to_string(i), {}});
   const Bytes whole = MakePackage(options).Build();
-  const TempDir folder;
+  const TempDir directory;
   bool was_changed = false;
   for (unsigned i = 0; i < 400 && !was_changed; ++i) {
-    const std::string file = folder.Write("base.apk", whole);
+    const std::string file = directory.Write("base.apk", whole);
     std::thread cutter([&] {
       usleep(i % 40 * 1000);
       EXPECT_EQ(truncate(file.c_str(), 3000), 0);
@@ -278,13 +278,13 @@ TEST(PackageFacts, TellWhatLiesWhereTheToolLooksForALibrary) {
   }
   options.entries.push_back({"lib/armeabi/other.so", ToBytes("x")});
   options.entries.push_back({"lib/x86/other.so", ToBytes("x")});
-  const TempDir folder;
-  const std::string file = folder / "base.apk";
+  const TempDir directory;
+  const std::string file = directory / "base.apk";
   MakePackage(options).WriteTo(file);
-  folder.Write("lib/arm64/there.so", ToBytes("x"));
-  const std::string leased = folder.Write("lib/arm64/leased.so", ToBytes("x"));
-  ASSERT_EQ(mkfifo((folder / "lib/arm64/pipe.so").c_str(), 0600), 0);
-  ASSERT_EQ(symlink("loop.so", (folder / "lib/arm64/loop.so").c_str()), 0);
+  directory.Write("lib/arm64/there.so", ToBytes("x"));
+  const std::string leased = directory.Write("lib/arm64/leased.so", ToBytes("x"));
+  ASSERT_EQ(mkfifo((directory / "lib/arm64/pipe.so").c_str(), 0600), 0);
+  ASSERT_EQ(symlink("loop.so", (directory / "lib/arm64/loop.so").c_str()), 0);
   signal(SIGIO, SIG_IGN);
   const int holder = open(leased.c_str(), O_RDWR);
   ASSERT_EQ(fcntl(holder, F_SETLEASE, F_WRLCK), 0);
@@ -309,11 +309,11 @@ TEST(PackageFacts, TellWhatLiesWhereTheToolLooksForALibrary) {
 
 // Libraries lie beside the file itself, and not beside a link to it.
 TEST(PackageFacts, LibrariesAreLookedForBesideTheFileItself) {
-  const TempDir folder;
-  MakePackage().WriteTo(folder.File("app/base.apk"));
-  folder.Write("app/lib/arm64/libfoo.so", ToBytes("x"));
-  ASSERT_EQ(symlink("app/base.apk", (folder / "link").c_str()), 0);
-  const PackageFacts facts = LookAt(folder / "link");
+  const TempDir directory;
+  MakePackage().WriteTo(directory.File("app/base.apk"));
+  directory.Write("app/lib/arm64/libfoo.so", ToBytes("x"));
+  ASSERT_EQ(symlink("app/base.apk", (directory / "link").c_str()), 0);
+  const PackageFacts facts = LookAt(directory / "link");
   ASSERT_EQ(facts.libraries.size(), 1U);
   EXPECT_EQ(facts.libraries[0].error, 0);
 }

@@ -102,7 +102,7 @@ TEST(IntegrityFile, IsTheLowestFreeDescriptor) {
 
 TEST(IntegrityFile, OtherFilesAreOpenedAsEver) {
   const Probe probe({});
-  const std::string file = probe.folder().Write("number", ToBytes("2e"));
+  const std::string file = probe.directory().Write("number", ToBytes("2e"));
   const Lines ways = {"fopen " + file + " r", "fopen64 " + file + " r"};
   EXPECT_EQ(Probe(ways).Run().results, Lines(ways.size(), "46 77"));
 }

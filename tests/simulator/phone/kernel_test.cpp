@@ -92,7 +92,7 @@ TEST(KernelVerify, FileThatIsNotTrustedIsEnokey) {
 
 TEST(KernelVerify, TrustedFileIsTrustedUnderAnyName) {
   const Probe probe({"verify 3", "verify64 3"});
-  const std::string other = probe.folder() / "link";
+  const std::string other = probe.directory() / "link";
   ASSERT_EQ(link(probe.path().c_str(), other.c_str()), 0);
   const ProbeRun run = probe.Run({"--trust", "/dev/null", "--trust", other});
   EXPECT_EQ(run.errors, "");
@@ -186,7 +186,7 @@ TEST(KernelStandIn, WritesNothingToTheStandardStreams) {
   const Probe probe({"sign 3 0000", "verify 3", "log 6 tag 61", "register 3 name ab",
                      "fopen /proc/self/integrity/value r"});
   const ProcessResult result =
-      RunProcess({"env", PRELOAD_KERNEL, "APKTOOLKIT_SIM_JOURNAL=" + probe.folder() / "journal",
+      RunProcess({"env", PRELOAD_KERNEL, "APKTOOLKIT_SIM_JOURNAL=" + probe.directory() / "journal",
                   PROBE_COMMAND, probe.path()});
   EXPECT_EQ(result.output, "");
   EXPECT_EQ(result.errors, "");

@@ -19,7 +19,7 @@ std::string Join(const Lines& lines) {
 
 }  // namespace
 
-Probe::Probe(const Lines& commands) { folder_.Write("script", ToBytes(Join(commands))); }
+Probe::Probe(const Lines& commands) { directory_.Write("script", ToBytes(Join(commands))); }
 
 ProbeRun Probe::Run(const Lines& options) const {
   Lines command = {SimulatorPath(), "--json", "--tool", PROBE_PATH};

@@ -17,18 +17,18 @@ struct ProbeRun {
   std::vector<Json> events;  // the journal, from the event after "attached" to "exit"
 };
 
-// A file of commands in a folder of its own.
+// A file of commands in a directory of its own.
 class Probe {
  public:
   explicit Probe(const Lines& commands);
 
   ProbeRun Run(const Lines& options = {}) const;
   // The file, resolved.
-  std::string path() const { return folder_ / "script"; }
-  const TempDir& folder() const { return folder_; }
+  std::string path() const { return directory_ / "script"; }
+  const TempDir& directory() const { return directory_; }
 
  private:
-  TempDir folder_;
+  TempDir directory_;
 };
 
 // Only those of `events` that are of this kind.

@@ -36,7 +36,7 @@ TEST(StandardOutput, TextsAreBytes) {
 TEST(StandardOutput, ReachesItsDescriptor) {
   const Probe probe({"puts one", "print 74776f"});
   const ProcessResult result =
-      RunProcess({"env", PRELOAD_KERNEL, "APKTOOLKIT_SIM_JOURNAL=" + probe.folder() / "journal",
+      RunProcess({"env", PRELOAD_KERNEL, "APKTOOLKIT_SIM_JOURNAL=" + probe.directory() / "journal",
                   PROBE_COMMAND, probe.path()});
   EXPECT_EQ(result.output, "one\ntwo");
 }

@@ -26,15 +26,15 @@ const Deadline kLater(1e6);
 // "path content" of each file that is laid out beside the package.
 std::vector<std::string> LaidOutOf(const PackageOptions& package, InstalledAbi abi,
                                    std::vector<std::string>* left_out = nullptr) {
-  const TempDir folder;
-  const std::string file = folder / "base.apk";
+  const TempDir directory;
+  const std::string file = directory / "base.apk";
   MakePackage(package).WriteTo(file);
   Installation installation;
   EXPECT_EQ(installation.LayOut(file, InstallWhen::kAlways, abi, kLater), std::nullopt);
   if (left_out != nullptr) *left_out = installation.left_out();
   const fs::path place = fs::path(installation.path()).parent_path();
   std::vector<std::string> files;
-  if (place == folder.path()) return files;
+  if (place == directory.path()) return files;
   EXPECT_EQ(ContentOf(installation.path()), ContentOf(file));
   for (const auto& entry : fs::recursive_directory_iterator(place)) {
     if (!entry.is_regular_file() || entry.path() == installation.path()) continue;
@@ -98,7 +98,7 @@ TEST(Installation, PackageThatKeepsItsLibrariesStaysWhereItIs) {
   EXPECT_EQ(laid_out(false), Files());
 }
 
-TEST(Installation, NamesDoNotLeadOutOfTheirFolder) {
+TEST(Installation, NamesDoNotLeadOutOfTheirDirectory) {
   Files left_out;
   EXPECT_EQ(LaidOut({{"lib/arm64-v8a/liba.so", ToBytes("good")},
                      {"lib/arm64-v8a/../../../outside.so", ToBytes("bad")},
@@ -130,10 +130,10 @@ TEST(Installation, OfAFileThatShrinksMeanwhileIsNone) {
     libraries.push_back({"lib/arm64-v8a/" + std::to_string(i) + ".so", {}});
   }
   const Bytes whole = MakePackage(WithLibraries(libraries)).Build();
-  const TempDir folder;
+  const TempDir directory;
   bool is_told = false;
   for (unsigned i = 0; i < 400 && !is_told; ++i) {
-    const std::string file = folder.Write("base.apk", whole);
+    const std::string file = directory.Write("base.apk", whole);
     std::thread cutter([&] {
       usleep(i % 40 * 1000);
       EXPECT_EQ(truncate(file.c_str(), 3000), 0);
@@ -156,8 +156,8 @@ TEST(Installation, TellsWhatCannotBeExtracted) {
   crc.local.crc = 1;
   ZipItem size = {"lib/arm64-v8a/libsize.so", ToBytes("data")};
   size.local.length = 5;
-  const TempDir folder;
-  const std::string file = folder / "base.apk";
+  const TempDir directory;
+  const std::string file = directory / "base.apk";
   const ZipItem good = {"lib/arm64-v8a/liba.so", ToBytes("good")};
   MakePackage(WithLibraries({undeflatable, good, unknown, crc, size})).WriteTo(file);
   Installation installation;
@@ -174,8 +174,8 @@ TEST(Installation, TellsWhatCannotBeExtracted) {
 
 // Its own name cannot stand in the way of what is laid out beside it.
 TEST(Installation, OfAFileThatIsCalledAsALibrarysDirectory) {
-  const TempDir folder;
-  const std::string file = folder / "lib";
+  const TempDir directory;
+  const std::string file = directory / "lib";
   MakePackage().WriteTo(file);
   Installation installation;
   EXPECT_EQ(installation.LayOut(file, InstallWhen::kAlways, InstalledAbi::kAll, kLater),
@@ -187,8 +187,8 @@ TEST(Installation, OfAFileThatIsCalledAsALibrarysDirectory) {
 
 // The first write that does not fit, into the copy or into a library.
 TEST(Installation, SaysWhenItCannotWrite) {
-  const TempDir folder;
-  const std::string file = folder / "base.apk";
+  const TempDir directory;
+  const std::string file = directory / "base.apk";
   MakePackage(WithLibraries({{"lib/arm64-v8a/liba.so", Bytes(3000, 'a')}})).WriteTo(file);
   const auto problem_with = [&file](rlim_t most) {
     rlimit before = {};
@@ -210,8 +210,8 @@ TEST(Installation, SaysWhenItCannotWrite) {
 
 // A lease is not waited for: the tool, which waits, tells of it.
 TEST(Installation, DoesNotWaitForWhoHoldsALease) {
-  const TempDir folder;
-  const std::string file = folder / "base.apk";
+  const TempDir directory;
+  const std::string file = directory / "base.apk";
   MakePackage().WriteTo(file);
   signal(SIGIO, SIG_IGN);
   const int holder = open(file.c_str(), O_RDWR);
@@ -224,8 +224,8 @@ TEST(Installation, DoesNotWaitForWhoHoldsALease) {
 }
 
 TEST(Installation, IsGoneWithItsOwner) {
-  const TempDir folder;
-  const std::string file = folder / "base.apk";
+  const TempDir directory;
+  const std::string file = directory / "base.apk";
   MakePackage().WriteTo(file);
   std::string path;
   {
@@ -242,10 +242,10 @@ TEST(Installation, IsGoneWithItsOwner) {
 
 // A file that has no name cannot get another one, as one on another file system cannot.
 TEST(Installation, OfAFileThatCannotBeLinkedIsACopyAndNotForEver) {
-  const TempDir folder;
+  const TempDir directory;
   MakePackage(WithLibraries({{"lib/arm64-v8a/liba.so", Bytes(3 << 20, 'a')}}))
-      .WriteTo(folder / "base.apk");
-  const std::string package = ContentOf(folder / "base.apk");
+      .WriteTo(directory / "base.apk");
+  const std::string package = ContentOf(directory / "base.apk");
   const int memory = memfd_create("base.apk", MFD_CLOEXEC);
   ASSERT_EQ(write(memory, package.data(), package.size()), static_cast<ssize_t>(package.size()));
   const std::string file = "/proc/self/fd/" + std::to_string(memory);
@@ -263,9 +263,9 @@ TEST(Installation, OfAFileThatCannotBeLinkedIsACopyAndNotForEver) {
 }
 
 TEST(Installation, LeavesOtherFilesWhereTheyAre) {
-  const TempDir folder;
+  const TempDir directory;
   for (const std::string& file :
-       {folder.path(), folder / "none", folder.Write("note.txt", ToBytes("text")),
+       {directory.path(), directory / "none", directory.Write("note.txt", ToBytes("text")),
         std::string("/dev/zero")}) {
     Installation installation;
     EXPECT_EQ(installation.LayOut(file, InstallWhen::kAlways, InstalledAbi::kAll, kLater),
@@ -275,8 +275,8 @@ TEST(Installation, LeavesOtherFilesWhereTheyAre) {
 }
 
 TEST(Installation, SaysWhenThereIsNoPlaceForIt) {
-  const TempDir folder;
-  const std::string file = folder / "base.apk";
+  const TempDir directory;
+  const std::string file = directory / "base.apk";
   MakePackage().WriteTo(file);
   const char* const before = getenv("TMPDIR");
   const std::string kept = before == nullptr ? "/tmp" : before;
@@ -290,8 +290,8 @@ TEST(Installation, SaysWhenThereIsNoPlaceForIt) {
 
 // An interruption ends the writing at once, even when time is left.
 TEST(Installation, EndsWhenTheProcessIsToEnd) {
-  const TempDir folder;
-  const std::string file = folder / "base.apk";
+  const TempDir directory;
+  const std::string file = directory / "base.apk";
   MakePackage(WithLibraries({kBoth[0]})).WriteTo(file);
   const auto lay_out = [&] {
     CatchInterruptions();
@@ -306,8 +306,8 @@ TEST(Installation, EndsWhenTheProcessIsToEnd) {
 // ---- A package that lies alone.
 
 TEST(Installation, IsMadeOfAPackageThatLiesAlone) {
-  const TempDir folder;
-  const std::string file = folder / "base.apk";
+  const TempDir directory;
+  const std::string file = directory / "base.apk";
   // The tool looks for a library of this ABI in lib/armX.
   MakePackage(WithLibraries({kBoth[0], {"lib/armeabiX/libx.so", ToBytes("x")}})).WriteTo(file);
   const auto is_laid_out = [&file](InstallWhen when) {
@@ -319,28 +319,28 @@ TEST(Installation, IsMadeOfAPackageThatLiesAlone) {
   EXPECT_TRUE(is_laid_out(InstallWhen::kAlone));
   EXPECT_FALSE(is_laid_out(InstallWhen::kNever));
   for (const char* place : {"lib/arm64", "lib/arm", "lib/armX/libx.so"}) {
-    fs::create_directories(folder / place);
+    fs::create_directories(directory / place);
     EXPECT_FALSE(is_laid_out(InstallWhen::kAlone)) << place;
     EXPECT_TRUE(is_laid_out(InstallWhen::kAlways)) << place;
-    fs::remove_all(folder / "lib");
+    fs::remove_all(directory / "lib");
   }
   // A link lies elsewhere, and the tool looks beside the package.
   const TempDir links;
   fs::create_symlink(file, links / "base.apk");
-  fs::create_directories(folder / "lib/arm64");
+  fs::create_directories(directory / "lib/arm64");
   Installation of_link;
   EXPECT_EQ(of_link.LayOut(links / "base.apk", InstallWhen::kAlone, InstalledAbi::kAll, kLater),
             std::nullopt);
   EXPECT_FALSE(of_link.is_done());
-  fs::remove_all(folder / "lib");
+  fs::remove_all(directory / "lib");
   // Nobody can tell whether there is one.
-  fs::create_symlink("lib", folder / "lib");
+  fs::create_symlink("lib", directory / "lib");
   EXPECT_FALSE(is_laid_out(InstallWhen::kAlone));
 }
 
 TEST(Installation, LeavesAJarWithLibrariesWhereItIs) {
-  const TempDir folder;
-  const std::string file = folder / "a.jar";
+  const TempDir directory;
+  const std::string file = directory / "a.jar";
   Package package = MakePackage();
   package.items.erase(
       std::remove_if(package.items.begin(), package.items.end(),
@@ -354,8 +354,8 @@ TEST(Installation, LeavesAJarWithLibrariesWhereItIs) {
 }
 
 TEST(Installation, NamesTheLibrariesOfOtherProcessors) {
-  const TempDir folder;
-  const std::string file = folder / "base.apk";
+  const TempDir directory;
+  const std::string file = directory / "base.apk";
   MakePackage(WithLibraries(kBoth)).WriteTo(file);
   const auto others = [&file](InstalledAbi abi) {
     Installation installation;
@@ -370,8 +370,8 @@ TEST(Installation, NamesTheLibrariesOfOtherProcessors) {
 }
 
 TEST(Installation, ItsPathsAreStable) {
-  const TempDir folder;
-  const std::string file = folder / "base.apk";
+  const TempDir directory;
+  const std::string file = directory / "base.apk";
   MakePackage(WithLibraries({kBoth[0]})).WriteTo(file);
   Installation installation;
   EXPECT_EQ(installation.WithStablePaths("/x/base.apk"), "/x/base.apk");

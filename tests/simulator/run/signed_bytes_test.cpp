@@ -21,126 +21,126 @@ constexpr char kDigestOfAbc[] = "ba7816bf8f01cfea414140de5dae2223b00361a396177a9
 }  // namespace
 
 TEST(SignedBytes, AreTrustedUnderAnyNameWhileTheyStayTheSame) {
-  const TempDir folder;
-  const std::string file = folder.Write("file", ToBytes("abc"));
-  const std::string copy = folder.Write("copy", ToBytes("abc"));
+  const TempDir directory;
+  const std::string file = directory.Write("file", ToBytes("abc"));
+  const std::string copy = directory.Write("copy", ToBytes("abc"));
   SignedBytes bytes("", true);
   ASSERT_TRUE(bytes.Load());
   EXPECT_FALSE(bytes.Holds(file, kLater));
   EXPECT_TRUE(bytes.Add(file, kLater));
   EXPECT_TRUE(bytes.Holds(file, kLater));
   EXPECT_TRUE(bytes.Holds(copy, kLater));
-  folder.Write("file", ToBytes("abd"));
+  directory.Write("file", ToBytes("abd"));
   EXPECT_FALSE(bytes.Holds(file, kLater));
-  folder.Write("file", ToBytes("abcd"));
+  directory.Write("file", ToBytes("abcd"));
   EXPECT_FALSE(bytes.Holds(file, kLater));
 }
 
 TEST(SignedBytes, OfTheSameFileAreTrustedUnlessItWasTouched) {
-  const TempDir folder;
-  const std::string file = folder.Write("file", ToBytes("abc"));
+  const TempDir directory;
+  const std::string file = directory.Write("file", ToBytes("abc"));
   SignedBytes bytes("", true);
   EXPECT_TRUE(bytes.Add(file, kLater));
   // Nothing need be read for that.
   EXPECT_TRUE(bytes.Holds(file, kPassed));
-  folder.Write("file", ToBytes("abd"));
+  directory.Write("file", ToBytes("abd"));
   EXPECT_FALSE(bytes.Holds(file, kLater));
 }
 
 // The same length and the same time of the last change: that of its state is another.
 TEST(SignedBytes, ThatWereChangedWithoutASignInTheirTimeAreNotTrusted) {
-  const TempDir folder;
-  const std::string file = folder.Write("file", ToBytes("abc"));
+  const TempDir directory;
+  const std::string file = directory.Write("file", ToBytes("abc"));
   struct stat before = {};
   ASSERT_EQ(stat(file.c_str(), &before), 0);
   SignedBytes bytes("", true);
   ASSERT_TRUE(bytes.Add(file, kLater));
   usleep(20000);  // the clock of file systems is coarse
-  folder.Write("file", ToBytes("abd"));
+  directory.Write("file", ToBytes("abd"));
   const timespec times[] = {before.st_atim, before.st_mtim};
   ASSERT_EQ(utimensat(AT_FDCWD, file.c_str(), times, 0), 0);
   EXPECT_FALSE(bytes.Holds(file, kLater));
 }
 
 TEST(SignedBytes, ThatCannotBeReadInTimeAreNotTrusted) {
-  const TempDir folder;
-  const std::string file = folder.Write("file", ToBytes("abc"));
-  const std::string copy = folder.Write("copy", ToBytes("abc"));
+  const TempDir directory;
+  const std::string file = directory.Write("file", ToBytes("abc"));
+  const std::string copy = directory.Write("copy", ToBytes("abc"));
   SignedBytes bytes("", true);
   EXPECT_TRUE(bytes.Add(file, kLater));
   EXPECT_FALSE(bytes.Holds(copy, kPassed));
-  SignedBytes kept(folder / "state", true);
+  SignedBytes kept(directory / "state", true);
   EXPECT_FALSE(kept.Add(file, kPassed));
 }
 
 TEST(SignedBytes, AreForLaterRunsAloneWhereTheFilesOfARunDoNotShareThem) {
-  const TempDir folder;
-  const std::string file = folder.Write("file", ToBytes("abc"));
-  SignedBytes first(folder / "state", false);
+  const TempDir directory;
+  const std::string file = directory.Write("file", ToBytes("abc"));
+  SignedBytes first(directory / "state", false);
   ASSERT_TRUE(first.Load());
   EXPECT_TRUE(first.Add(file, kLater));
   EXPECT_FALSE(first.Holds(file, kLater));
-  SignedBytes second(folder / "state", false);
+  SignedBytes second(directory / "state", false);
   ASSERT_TRUE(second.Load());
   EXPECT_TRUE(second.Holds(file, kLater));
 }
 
 // Reading any of them would wait for ever, or never end.
 TEST(SignedBytes, OfPipesAndDevicesAreNotRead) {
-  const TempDir folder;
-  const std::string pipe = folder / "pipe";
+  const TempDir directory;
+  const std::string pipe = directory / "pipe";
   ASSERT_EQ(mkfifo(pipe.c_str(), 0600), 0);
-  folder.Write("state/name", ToBytes("x"));
-  SignedBytes bytes(folder / "state", true);
+  directory.Write("state/name", ToBytes("x"));
+  SignedBytes bytes(directory / "state", true);
   ASSERT_TRUE(bytes.Load());
   EXPECT_FALSE(bytes.Holds(pipe, kLater));
   EXPECT_FALSE(bytes.Holds("/dev/zero", kLater));
 }
 
 TEST(SignedBytes, AreKeptByTheirDigest) {
-  const TempDir folder;
-  const std::string file = folder.Write("file", ToBytes("abc"));
-  const std::string directory = folder / "state/of/phone";
-  SignedBytes first(directory, true);
+  const TempDir directory;
+  const std::string file = directory.Write("file", ToBytes("abc"));
+  const std::string state = directory / "state/of/phone";
+  SignedBytes first(state, true);
   ASSERT_TRUE(first.Load());
   EXPECT_TRUE(first.Add(file, kLater));
-  EXPECT_EQ(ContentOf(directory + "/" + kDigestOfAbc), file + "\n");
-  SignedBytes second(directory, true);
+  EXPECT_EQ(ContentOf(state + "/" + kDigestOfAbc), file + "\n");
+  SignedBytes second(state, true);
   ASSERT_TRUE(second.Load());
   EXPECT_TRUE(second.Holds(file, kLater));
 }
 
 TEST(SignedBytes, ThatAreNotSharedAreForLaterRunsAlone) {
-  const TempDir folder;
-  const std::string file = folder.Write("file", ToBytes("abc"));
+  const TempDir directory;
+  const std::string file = directory.Write("file", ToBytes("abc"));
   SignedBytes none("", false);
   EXPECT_TRUE(none.Add(file, kLater));
   EXPECT_FALSE(none.Holds(file, kLater));
-  SignedBytes kept(folder / "state", false);
+  SignedBytes kept(directory / "state", false);
   ASSERT_TRUE(kept.Load());
   EXPECT_TRUE(kept.Add(file, kLater));
   EXPECT_FALSE(kept.Holds(file, kLater));
-  SignedBytes later(folder / "state", false);
+  SignedBytes later(directory / "state", false);
   ASSERT_TRUE(later.Load());
   EXPECT_TRUE(later.Holds(file, kLater));
 }
 
 TEST(SignedBytes, OfAFileThatCannotBeReadAreNeverTrusted) {
-  const TempDir folder;
-  SignedBytes bytes(folder / "state", true);
+  const TempDir directory;
+  SignedBytes bytes(directory / "state", true);
   ASSERT_TRUE(bytes.Load());
-  EXPECT_TRUE(bytes.Add(folder / "missing", kLater));
-  EXPECT_FALSE(bytes.Holds(folder / "missing", kLater));
-  EXPECT_TRUE(bytes.Add(folder.path(), kLater));  // a directory
-  EXPECT_FALSE(bytes.Holds(folder.path(), kLater));
+  EXPECT_TRUE(bytes.Add(directory / "missing", kLater));
+  EXPECT_FALSE(bytes.Holds(directory / "missing", kLater));
+  EXPECT_TRUE(bytes.Add(directory.path(), kLater));  // a directory
+  EXPECT_FALSE(bytes.Holds(directory.path(), kLater));
 }
 
 TEST(SignedBytes, NeedADirectoryThatCanBeUsed) {
-  const TempDir folder;
-  const std::string file = folder.Write("file", ToBytes("abc"));
+  const TempDir directory;
+  const std::string file = directory.Write("file", ToBytes("abc"));
   EXPECT_FALSE(SignedBytes(file, true).Load());
-  SignedBytes bytes(folder / "state", true);
+  SignedBytes bytes(directory / "state", true);
   ASSERT_TRUE(bytes.Load());
-  ASSERT_EQ(rmdir((folder / "state").c_str()), 0);
+  ASSERT_EQ(rmdir((directory / "state").c_str()), 0);
   EXPECT_FALSE(bytes.Add(file, kLater));
 }
