@@ -25,8 +25,8 @@ bool AreSame(const std::string& one, const std::string& other) {
 }  // namespace
 
 TEST(OutputFile, ReplacesAnEarlierOne) {
-  const TempDir folder;
-  const std::string path = folder.Write("list", ToBytes("list: 1, 2, 3"));
+  const TempDir directory;
+  const std::string path = directory.Write("list", ToBytes("list: 1, 2, 3"));
   EXPECT_EQ(Objection(path), std::nullopt);
   OutputFile file(kList, path);
   ASSERT_TRUE(file.Open());
@@ -36,16 +36,16 @@ TEST(OutputFile, ReplacesAnEarlierOne) {
 }
 
 TEST(OutputFile, ReplacesWhatIsEmptyOrNotThereOrNoFile) {
-  const TempDir folder;
-  EXPECT_EQ(Objection(folder.Write("empty", {})), std::nullopt);
-  EXPECT_EQ(Objection(folder / "none"), std::nullopt);
+  const TempDir directory;
+  EXPECT_EQ(Objection(directory.Write("empty", {})), std::nullopt);
+  EXPECT_EQ(Objection(directory / "none"), std::nullopt);
   EXPECT_EQ(Objection("/dev/null"), std::nullopt);
 }
 
 TEST(OutputFile, LeavesAnythingElseAlone) {
-  const TempDir folder;
+  const TempDir directory;
   for (const char* content : {"PK\3\4 and more than a list begins with", "list", " list:"}) {
-    const std::string path = folder.Write("base.apk", ToBytes(content));
+    const std::string path = directory.Write("base.apk", ToBytes(content));
     EXPECT_EQ(Objection(path), "--list " + path +
                                    " is there and holds no list of apktoolkit-sim; it is left "
                                    "alone");
@@ -53,31 +53,31 @@ TEST(OutputFile, LeavesAnythingElseAlone) {
 }
 
 TEST(OutputFile, LeavesAFileThatIsLookedAtAloneUnderAnyName) {
-  const TempDir folder;
-  const std::string path = folder.Write("list", ToBytes("list:"));
-  const std::string link = folder / "link";
+  const TempDir directory;
+  const std::string path = directory.Write("list", ToBytes("list:"));
+  const std::string link = directory / "link";
   ASSERT_EQ(symlink("list", link.c_str()), 0);
   EXPECT_EQ(Objection(path, {"/nowhere", link}),
             "--list " + path + " is a file that is to be looked at; it is left alone");
 }
 
 TEST(OutputFile, IsTheSameUnderTwoNames) {
-  const TempDir folder;
-  const std::string path = folder.Write("list", {});
-  const std::string link = folder / "link";
-  const std::string twin = folder / "twin";
+  const TempDir directory;
+  const std::string path = directory.Write("list", {});
+  const std::string link = directory / "link";
+  const std::string twin = directory / "twin";
   ASSERT_EQ(symlink("list", link.c_str()), 0);
   ASSERT_EQ(::link(path.c_str(), twin.c_str()), 0);
   EXPECT_TRUE(AreSame(path, path));
   EXPECT_TRUE(AreSame(path, link));
   EXPECT_TRUE(AreSame(path, twin));
-  EXPECT_TRUE(AreSame(folder / "none", folder / "./none"));
-  const std::string dangling = folder / "dangling", other = folder / "other";
+  EXPECT_TRUE(AreSame(directory / "none", directory / "./none"));
+  const std::string dangling = directory / "dangling", other = directory / "other";
   ASSERT_EQ(symlink("none", dangling.c_str()), 0);
   ASSERT_EQ(symlink("dangling", other.c_str()), 0);
-  EXPECT_TRUE(AreSame(dangling, folder / "none"));
+  EXPECT_TRUE(AreSame(dangling, directory / "none"));
   EXPECT_TRUE(AreSame(other, dangling));
-  EXPECT_FALSE(AreSame(path, folder / "none"));
+  EXPECT_FALSE(AreSame(path, directory / "none"));
   EXPECT_FALSE(AreSame(path, ""));
   EXPECT_FALSE(AreSame("", ""));
   EXPECT_FALSE(AreSame("/dev/null", "/dev/null"));
