@@ -1,5 +1,5 @@
-// ReadFile and GetFilenameByFd with real files, and with kernel answers that real files give only
-// by chance.
+// ReadFile, OpenForReading and IsSameFile with real files, and with kernel answers that real files
+// give only by chance.
 #include "util/file.h"
 
 #include <fcntl.h>
@@ -15,78 +15,18 @@
 #include <cstdlib>
 #include <cstring>
 #include <fstream>
-#include <functional>
 #include <numeric>
 #include <string>
 #include <vector>
 
-#include "support/files.h"
 #include "support/lease.h"
 #include "support/log_capture.h"
-
-// The answers that a test sets. The kernel itself answers if a test sets none.
-namespace {
-
-struct Kernel {
-  std::function<int(struct stat*)> fstat;
-  std::function<off_t(int whence)> lseek;
-  std::function<void*(size_t length)> mmap;
-  std::function<ssize_t(int fd, void* buffer, size_t size)> read;
-  std::function<ssize_t(char* buffer, size_t size)> readlink;
-};
-Kernel kernel;
-
-}  // namespace
-
-extern "C" {
-int __real_fstat(int fd, struct stat* status);
-off_t __real_lseek(int fd, off_t offset, int whence);
-void* __real_mmap(void* address, size_t length, int protection, int flags, int fd, off_t offset);
-ssize_t __real_read(int fd, void* buffer, size_t size);
-ssize_t __real_readlink(const char* path, char* buffer, size_t size);
-
-int __wrap_fstat(int fd, struct stat* status) {
-  return kernel.fstat ? kernel.fstat(status) : __real_fstat(fd, status);
-}
-off_t __wrap_lseek(int fd, off_t offset, int whence) {
-  return kernel.lseek ? kernel.lseek(whence) : __real_lseek(fd, offset, whence);
-}
-void* __wrap_mmap(void* address, size_t length, int protection, int flags, int fd, off_t offset) {
-  return kernel.mmap ? kernel.mmap(length)
-                     : __real_mmap(address, length, protection, flags, fd, offset);
-}
-ssize_t __wrap_read(int fd, void* buffer, size_t size) {
-  return kernel.read ? kernel.read(fd, buffer, size) : __real_read(fd, buffer, size);
-}
-ssize_t __wrap_readlink(const char* path, char* buffer, size_t size) {
-  return kernel.readlink ? kernel.readlink(buffer, size) : __real_readlink(path, buffer, size);
-}
-
-// The names of read and readlink in a build with _FORTIFY_SOURCE, as in every platform tree.
-ssize_t __wrap___read_chk(int fd, void* buffer, size_t size, size_t /*room*/) {
-  return __wrap_read(fd, buffer, size);
-}
-ssize_t __wrap___readlink_chk(const char* path, char* buffer, size_t size, size_t /*room*/) {
-  return __wrap_readlink(path, buffer, size);
-}
-}
+#include "util/file_fixture.h"
 
 namespace {
 
-class FileTest : public testing::Test {
+class FileTest : public FileFixture {
  protected:
-  void SetUp() override { alarm(60); }  // ends a test that waits for a FIFO
-  void TearDown() override {
-    kernel = Kernel();
-    alarm(0);
-  }
-
-  std::string Path(const std::string& name) const { return directory_ / name; }
-
-  std::string MakeFile(const std::string& content) const {
-    return directory_.Write("file", ToBytes(content));
-  }
-
   // `path` cannot be read; only `message` is logged, and `out` is unchanged.
   static void ExpectRefused(const std::string& path, const std::string& message) {
     LogCapture log;
@@ -98,12 +38,9 @@ class FileTest : public testing::Test {
   static void ExpectNoSize(const std::string& path) {
     ExpectRefused(path, "Can't read file: " + path + " (streamoff=-1)\n");
   }
-
-  TempDir directory_;
 };
 using ReadFileTest = FileTest;
 using OpenForReadingTest = FileTest;
-using GetFilenameByFdTest = FileTest;
 
 // The number that the next descriptor gets.
 int NextDescriptor() {
@@ -302,62 +239,6 @@ TEST_F(ReadFileTest, NoDescriptorStaysOpen) {
   EXPECT_EQ(before, NextDescriptor());
 }
 
-TEST_F(GetFilenameByFdTest, OpenFileHasItsPath) {
-  const int fd = open(MakeFile("").c_str(), O_RDONLY | O_CLOEXEC);
-  EXPECT_EQ(Path("file"), GetFilenameByFd(fd));
-  close(fd);
-}
-
-TEST_F(GetFilenameByFdTest, RemovedFileIsMarkedAsTheKernelMarksIt) {
-  const int fd = open(MakeFile("").c_str(), O_RDONLY | O_CLOEXEC);
-  ASSERT_EQ(0, unlink(Path("file").c_str()));
-  EXPECT_EQ(Path("file") + " (deleted)", GetFilenameByFd(fd));
-  close(fd);
-}
-
-TEST_F(GetFilenameByFdTest, ClosedDescriptorHasNoPath) {
-  LogCapture log;
-  const int fd = open("/dev/null", O_RDONLY | O_CLOEXEC);
-  close(fd);
-  EXPECT_EQ("", GetFilenameByFd(fd));
-  EXPECT_EQ("", GetFilenameByFd(-1));
-  EXPECT_EQ(Records(), log.records());
-}
-
-// Nested directories, each made and opened from the one above, because the path of the last is
-// longer than a path may be. They are removed at the end.
-class DeepDirectory {
- public:
-  DeepDirectory(const std::string& top, size_t path_length) {
-    fds_.push_back(open(top.c_str(), O_RDONLY | O_DIRECTORY | O_CLOEXEC));
-    for (size_t length = top.size(); length < path_length;) {
-      // A remainder of one byte would only have room for a slash.
-      size_t step = std::min<size_t>(path_length - length, 200);
-      if (path_length - length - step == 1) --step;
-      names_.push_back(std::string(step - 1, 'd'));
-      mkdirat(fds_.back(), names_.back().c_str(), 0700);
-      fds_.push_back(openat(fds_.back(), names_.back().c_str(), O_RDONLY | O_CLOEXEC));
-      path_ += "/" + names_.back();
-      length += step;
-    }
-    path_ = top + path_;
-  }
-  ~DeepDirectory() {
-    for (size_t i = names_.size(); i-- > 0;) {
-      close(fds_[i + 1]);
-      unlinkat(fds_[i], names_[i].c_str(), AT_REMOVEDIR);
-    }
-    close(fds_[0]);
-  }
-  int fd() const { return fds_.back(); }
-  const std::string& path() const { return path_; }
-
- private:
-  std::vector<int> fds_;
-  std::vector<std::string> names_;
-  std::string path_;
-};
-
 // ---- Through a descriptor.
 
 TEST_F(ReadFileTest, DescriptorIsReadFromItsStartIfThePathLeadsElsewhere) {
@@ -506,43 +387,6 @@ TEST(IsSameFile, FilesThatAreNotRegularAreNotTheSame) {
   EXPECT_FALSE(IsSameFile(state, state));
   state.st_mode = S_IFDIR | 0700;
   EXPECT_FALSE(IsSameFile(state, state));
-}
-
-TEST_F(GetFilenameByFdTest, TargetPathOf4094BytesIsWhole) {
-  const DeepDirectory deep(directory_.path(), 4094);
-  ASSERT_NE(-1, deep.fd());
-  EXPECT_EQ(deep.path(), GetFilenameByFd(deep.fd()));
-}
-
-TEST_F(GetFilenameByFdTest, TargetPathOf4095BytesIsItsFirst4095Bytes) {
-  const DeepDirectory deep(directory_.path(), 4095);
-  ASSERT_NE(-1, deep.fd());
-  EXPECT_EQ(4095U, GetFilenameByFd(deep.fd()).size());
-  EXPECT_EQ(deep.path(), GetFilenameByFd(deep.fd()));
-}
-
-// Linux does not return a longer path at all: readlink fails with ENAMETOOLONG.
-TEST_F(GetFilenameByFdTest, TargetPathOf4096BytesIsNotToldByTheKernel) {
-  const DeepDirectory deep(directory_.path(), 4096);
-  ASSERT_NE(-1, deep.fd());
-  EXPECT_EQ("", GetFilenameByFd(deep.fd()));
-}
-
-TEST_F(GetFilenameByFdTest, ALongerTargetPathIsItsFirst4095Bytes) {
-  std::string target(5000, 'a');
-  target[4094] = 'y';
-  target[4095] = 'z';
-  kernel.readlink = [&](char* buffer, size_t size) {
-    return static_cast<ssize_t>(target.copy(buffer, size));
-  };
-  EXPECT_EQ(target.substr(0, 4095), GetFilenameByFd(0));
-}
-
-TEST_F(GetFilenameByFdTest, TheTextEndsAtItsFirstNul) {
-  kernel.readlink = [](char* buffer, size_t size) {
-    return static_cast<ssize_t>(std::string("/a\0b", 4).copy(buffer, size));
-  };
-  EXPECT_EQ("/a", GetFilenameByFd(0));
 }
 
 TEST(StringToVector, BytesAreInOrderWithoutATerminator) {

@@ -1,0 +1,42 @@
+// The fixture for tests of util/file.h: a directory for files, and answers that the kernel gives
+// for real files only by chance.
+#pragma once
+
+#include <gtest/gtest.h>
+#include <sys/stat.h>
+#include <unistd.h>
+
+#include <functional>
+#include <string>
+
+#include "support/files.h"
+
+// The answers that a test sets. The kernel itself answers if a test sets none.
+struct Kernel {
+  std::function<int(struct stat*)> fstat;
+  std::function<off_t(int whence)> lseek;
+  std::function<void*(size_t length)> mmap;
+  std::function<ssize_t(int fd, void* buffer, size_t size)> read;
+  std::function<ssize_t(char* buffer, size_t size)> readlink;
+};
+extern Kernel kernel;
+
+// The C library's read.
+extern "C" ssize_t __real_read(int fd, void* buffer, size_t size);
+
+class FileFixture : public testing::Test {
+ protected:
+  void SetUp() override { alarm(60); }  // ends a test that waits for a FIFO
+  void TearDown() override {
+    kernel = Kernel();
+    alarm(0);
+  }
+
+  std::string Path(const std::string& name) const { return directory_ / name; }
+
+  std::string MakeFile(const std::string& content) const {
+    return directory_.Write("file", ToBytes(content));
+  }
+
+  TempDir directory_;
+};
