@@ -4,94 +4,9 @@
 
 #include <cerrno>
 
-#include "apk/native_libraries.h"
-
-#include "simulator/phone/probe_run.h"
+#include "simulator/verdict/made_report.h"
 
 using namespace simulator;
-
-namespace {
-
-const std::string kFile = "/data/app/base.apk";
-const std::string kLibrary = "/data/app/lib/arm64/libfoo.so";
-constexpr char kPackagePayload[] = "0100ab";
-constexpr char kNoData[] = "0000";
-
-const Json kStart = {{"event", "start"}, {"file", "base.apk"}, {"path", kFile}};
-const Json kExit = {{"event", "exit"}, {"status", 0}};
-
-Json Log(int priority, const std::string& text, const std::string& tag = "ApkToolkit") {
-  return {{"event", "log"}, {"priority", priority}, {"tag", tag}, {"text", text}};
-}
-
-Json Sign(const std::string& path, const std::string& payload, int error = 0) {
-  return {{"event", "sign"},          {"fd", 3},       {"path", path}, {"payload", payload},
-          {"result", error ? -1 : 0}, {"errno", error}};
-}
-
-Json Verify(int error) {
-  return {{"event", "verify"},
-          {"fd", 3},
-          {"path", kFile},
-          {"result", error ? -1 : 0},
-          {"errno", error}};
-}
-
-Json Integrity(const Json& text) { return {{"event", "integrity"}, {"pid", 0}, {"text", text}}; }
-
-Json Register(int64_t result) {
-  return {{"event", "register"}, {"fd", 3},      {"path", kFile},
-          {"name", "com.app"},   {"data", "ab"}, {"result", result}};
-}
-
-RunRecord Record(Events events, const Json& end = kExit) {
-  events.insert(events.begin(), kStart);
-  events.push_back(end);
-  return TakeApart(events);
-}
-
-Report Made(const Events& events, const PackageFacts& facts = {}, const JudgeOptions& options = {},
-            const Json& end = kExit) {
-  return MakeReport(Record(events, end), facts, options);
-}
-
-// "name state code detail", one line for each item.
-Lines ItemsOf(const Report& report) {
-  Lines lines;
-  for (const Item& item : report.items) {
-    constexpr const char* kStates[] = {"done", "refused", "absent", "nothing"};
-    std::string line = item.name + " " + kStates[static_cast<size_t>(item.state)];
-    if (item.reason.cause != nullptr) line += std::string(" ") + item.reason.cause->code;
-    if (!item.reason.detail.empty()) line += " " + item.reason.detail;
-    lines.push_back(line);
-  }
-  return lines;
-}
-
-Lines Items(const Events& events, const PackageFacts& facts = {}) {
-  return ItemsOf(Made(events, facts));
-}
-
-// The tool's log lines while it takes up one file for the kernel.
-const Json kTakesUp = Log(4, "VeltSignOat: Apk case.\n");
-const Json kLibrariesStart = Log(4, "VeltSignJni starts: 3.\n");
-const Json kFileStart = Log(4, "VeltSign starts: zip_fd = 3, fd = 3.\n");
-
-Json CannotSign(int error) {
-  return Log(6, "VELT can't sign a file (result=10000, errno " + std::to_string(error) + ": x).\n");
-}
-
-// The facts of a package with these libraries; opening each gives `error`.
-PackageFacts WithLibraries(const Lines& entries, int error = 0, bool has_directory = false) {
-  PackageFacts facts;
-  for (const std::string& name : entries) {
-    const std::string place = ApkTools::InstalledLibraryPath("", name);
-    facts.libraries.push_back({name, place, true, error, has_directory});
-  }
-  return facts;
-}
-
-}  // namespace
 
 TEST(MakeReport, GoodPackage) {
   const Report report =
@@ -138,102 +53,6 @@ TEST(MakeReport, ErrorAfterTheVerificationOfAJarCounts) {
   EXPECT_EQ(ItemsOf(report), Lines({"JAR done", "tool refused tool-error odd"}));
 }
 
-TEST(MakeReport, LibraryWithOtherBytesIsRefused) {
-  const Report report =
-      Made({kLibrariesStart, Log(6, "VeltSignJni: File not verified: " + kLibrary + "\n"),
-            kFileStart, Sign(kFile, kPackagePayload)});
-  EXPECT_EQ(report.verdict, Verdict::kPartlySigned);
-  EXPECT_EQ(ItemsOf(report),
-            Lines({"package done", "lib/arm64/libfoo.so refused library-changed"}));
-  EXPECT_TRUE(report.items[0].is_verified);
-  EXPECT_FALSE(report.items[1].is_verified);
-}
-
-// The library's item where this is logged of it, and opening it ends like this.
-std::string LibraryItem(const std::string& error, int opening = 0, bool has_directory = false,
-                        const JudgeOptions& options = {}) {
-  const Report report = Made(
-      {kLibrariesStart, Log(6, error), Log(6, "VeltSignJni: File not verified: " + kLibrary + "\n"),
-       kFileStart, Sign(kFile, kPackagePayload)},
-      WithLibraries({"lib/arm64-v8a/libfoo.so"}, opening, has_directory), options);
-  const Verdict expected =
-      report.items[1].state == ItemState::kRefused ? Verdict::kPartlySigned : Verdict::kSigned;
-  EXPECT_EQ(report.verdict, expected);
-  return ItemsOf(report)[1];
-}
-
-TEST(MakeReport, LinesBeforeALibraryWasNotVerifiedSayWhy) {
-  EXPECT_EQ(LibraryItem("Can't read file: x (streamoff=-1)\n"),
-            "lib/arm64/libfoo.so refused library-no-file");
-  EXPECT_EQ(LibraryItem("Can't find file in META-INF/MANIFEST.MF: x\n"),
-            "lib/arm64/libfoo.so refused library-not-listed");
-  EXPECT_EQ(LibraryItem("verifyData: Unsupported digest type: MD5-Digest\n"),
-            "lib/arm64/libfoo.so refused library-digest");
-}
-
-TEST(MakeReport, LibraryThatDoesNotOpenIsRefusedUnlessItIsNotThere) {
-  const auto item = [](int error, bool has_directory) {
-    return LibraryItem("Can't open file: x\n", error, has_directory).substr(20);
-  };
-  EXPECT_EQ(item(ENOENT, false), "absent library-not-installed");
-  EXPECT_EQ(item(ENOENT, true), "absent library-missing");
-  EXPECT_EQ(item(ENOTDIR, false), "absent library-not-installed");
-  EXPECT_EQ(item(EACCES, true), "refused library-no-permission");
-  EXPECT_EQ(item(EPERM, true), "refused library-no-permission");
-  EXPECT_EQ(item(EWOULDBLOCK, true), "refused library-leased");
-  EXPECT_EQ(item(ELOOP, true),
-            "refused library-not-opened ELOOP: Too many levels of symbolic links");
-  EXPECT_EQ(item(0, true), "refused library-not-opened why is not known");
-}
-
-TEST(MakeReport, LibraryThatIsNotThereIsRefusedWhereTheUserIsStrict) {
-  EXPECT_EQ(LibraryItem("Can't open file: x\n", ENOENT, false, {true}),
-            "lib/arm64/libfoo.so refused library-not-installed");
-  EXPECT_EQ(LibraryItem("Can't open file: x\n", ENOENT, true, {true}),
-            "lib/arm64/libfoo.so refused library-missing");
-}
-
-TEST(MakeReport, LibraryThatThePackageKeepsIsToldApart) {
-  PackageFacts facts = WithLibraries({"lib/arm64-v8a/libfoo.so"}, ENOENT);
-  facts.manifest.extracts_libraries = false;
-  EXPECT_EQ(Items({kLibrariesStart, Log(6, "Can't open file: x\n"),
-                   Log(6, "VeltSignJni: File not verified: " + kLibrary + "\n"), kFileStart,
-                   Sign(kFile, kPackagePayload)},
-                  facts)[1],
-            "lib/arm64/libfoo.so absent library-in-package");
-}
-
-// The tool's walk ends there, and what comes after is not signed however good it is.
-TEST(MakeReport, LibraryBehindADamagedEntryIsRefusedIfItLiesThere) {
-  const auto items = [](int error, bool is_strict) {
-    PackageFacts facts =
-        WithLibraries({"lib/arm64-v8a/liba.so", "lib/arm64-v8a/libb.so", "lib/x86/libc.so"}, error);
-    for (LibraryFacts& library : facts.libraries) library.is_met = false;
-    facts.libraries[0].is_met = true;
-    facts.libraries[0].error = 0;
-    return ItemsOf(Made({kLibrariesStart, kTakesUp, Integrity("1f"),
-                         Sign("/data/app/lib/arm64/liba.so", kPackagePayload), kFileStart,
-                         Sign(kFile, kPackagePayload)},
-                        facts, {is_strict}));
-  };
-  EXPECT_EQ(items(0, false), Lines({"package done", "lib/arm64/liba.so done",
-                                    "lib/arm64/libb.so refused library-behind-damage",
-                                    "lib/x86/libc.so nothing library-other-abi"}));
-  EXPECT_EQ(items(ENOENT, false)[2], "lib/arm64/libb.so absent library-not-installed");
-  EXPECT_EQ(items(ENOENT, true)[2], "lib/arm64/libb.so refused library-not-installed");
-}
-
-TEST(MakeReport, LibraryThatCannotBeLaidOutIsRefused) {
-  RunRecord record = Record({kLibrariesStart, Log(6, "Can't open file: x\n"),
-                             Log(6, "VeltSignJni: File not verified: " + kLibrary + "\n"),
-                             kFileStart, Sign(kFile, kPackagePayload)});
-  record.not_extracted = {"lib/arm64-v8a/libfoo.so"};
-  const Report report =
-      MakeReport(record, WithLibraries({"lib/arm64-v8a/libfoo.so"}, ENOENT, true), {});
-  EXPECT_EQ(report.verdict, Verdict::kPartlySigned);
-  EXPECT_EQ(ItemsOf(report)[1], "lib/arm64/libfoo.so refused library-not-extracted");
-}
-
 TEST(MakeReport, DamagedEntriesAreADoubtAndForTheStrictARefusal) {
   PackageFacts facts;
   facts.entries = {{{"res/a", 1, true}, true, false}, {{"res/b", 1, true}, true, false}};
@@ -258,70 +77,9 @@ TEST(MakeReport, OtherWarningsAreNoRefusalForTheStrict) {
   EXPECT_EQ(report.warnings[0].cause, &cause::kFileChanged);
 }
 
-TEST(MakeReport, LibraryThatVanishedIsRefused) {
-  EXPECT_EQ(Items({kLibrariesStart, Log(6, "File " + kLibrary + " is not opened"),
-                   Log(6, "Error 2: No such file or directory.\n"), kFileStart,
-                   Sign(kFile, kPackagePayload)})[1],
-            "lib/arm64/libfoo.so refused library-not-opened ENOENT: No such file or directory");
-}
-
-TEST(MakeReport, EachVanishedLibraryHasItsOwnError) {
-  const Lines items = Items({kLibrariesStart, Log(6, "File /data/app/a.so is not opened"),
-                             Log(6, "Error 2: x.\n"), Log(6, "File /data/app/b.so is not opened"),
-                             Log(6, "Error 13: x.\n"), kFileStart, Sign(kFile, kPackagePayload)});
-  EXPECT_EQ(items[1], "a.so refused library-not-opened ENOENT: No such file or directory");
-  EXPECT_EQ(items[2], "b.so refused library-not-opened EACCES: Permission denied");
-}
-
 TEST(MakeReport, ErrorThatNoLineTellsTheUseOfCounts) {
   EXPECT_EQ(Items({kFileStart, Sign(kFile, kPackagePayload), Log(6, "Can't open file: x\n")}),
             Lines({"package done", "tool refused tool-error Can't open file: x"}));
-}
-
-TEST(MakeReport, LibrariesOfOtherProcessorsAreNothingToSign) {
-  const PackageFacts facts = WithLibraries({"lib/x86_64/libfoo.so", "lib/armeabi/libfoo.so"});
-  const Report report = Made({kLibrariesStart, kTakesUp, Sign("/data/app/lib/arm/libfoo.so", "00"),
-                              kFileStart, Sign(kFile, kPackagePayload)},
-                             facts);
-  EXPECT_EQ(report.verdict, Verdict::kSigned);
-  EXPECT_EQ(ItemsOf(report),
-            Lines({"package done", "lib/x86_64/libfoo.so nothing library-other-abi",
-                   "lib/arm/libfoo.so done"}));
-}
-
-TEST(MakeReport, LibrariesOfARefusedPackageFollowIt) {
-  const PackageFacts facts = WithLibraries({"lib/arm64-v8a/libfoo.so"});
-  const Report report = Made({Log(6, "Can't validate manifest.\n"), kLibrariesStart,
-                              Log(6, "VeltSignJni: malformed apk: /a\n"), kFileStart, kTakesUp,
-                              Log(4, "VeltSign finished: 65536.\n")},
-                             facts);
-  EXPECT_EQ(report.verdict, Verdict::kRefused);
-  EXPECT_EQ(ItemsOf(report)[1], "lib/arm64/libfoo.so refused package-refused");
-  EXPECT_FALSE(report.items[0].is_verified);
-}
-
-// The tool names no path when it may not sign; the order of the libraries tells which it was.
-TEST(MakeReport, LibrariesThatTheKernelWasNotAskedForAreKnownByTheirOrder) {
-  const PackageFacts facts = WithLibraries({"lib/arm64-v8a/liba.so", "lib/arm64-v8a/libb.so"});
-  const Report report =
-      Made({kLibrariesStart, kTakesUp, Integrity("1f"),
-            Sign("/data/app/lib/arm64/liba.so", kPackagePayload), kTakesUp, Integrity("0"),
-            CannotSign(2), kFileStart, kTakesUp, Integrity(nullptr), CannotSign(2),
-            Log(4, "VeltSign finished: 65536.\n")},
-           facts);
-  EXPECT_EQ(report.verdict, Verdict::kPartlySigned);
-  EXPECT_EQ(ItemsOf(report), Lines({"package refused integrity-missing", "lib/arm64/liba.so done",
-                                    "lib/arm64/libb.so refused integrity-zero"}));
-}
-
-TEST(MakeReport, LibrariesBehindTheToolsEndAreNotReached) {
-  const Report report = Made({kLibrariesStart, kTakesUp, Integrity("1f"),
-                              Sign("/data/app/lib/arm64/liba.so", kPackagePayload)},
-                             WithLibraries({"lib/arm64-v8a/liba.so", "lib/arm64-v8a/libb.so"}), {},
-                             {{"event", "exit"}, {"signal", 9}});
-  EXPECT_EQ(ItemsOf(report),
-            Lines({"package refused not-reached", "lib/arm64/liba.so done",
-                   "lib/arm64/libb.so refused not-reached", "tool refused tool-killed 9"}));
 }
 
 TEST(MakeReport, IntegrityValuesAreReadAsTheToolReadsThem) {
