@@ -1,87 +1,17 @@
-// Why a package is refused, as the person sees it who brings it: real packages, made by the tools
-// that developers make them with, and the first lines of what they are told.
+// Why a package is refused, in the words of the simulator. The packages are real: the developers'
+// own tools make them.
 #include <gtest/gtest.h>
-#include <sys/stat.h>
-#include <unistd.h>
 
 #include <algorithm>
 #include <filesystem>
 
+#include "journeys/reason.h"
 #include "support/files.h"
 #include "support/namespaces.h"
 #include "support/package.h"
-#include "support/process.h"
 #include "support/signature_block.h"
-#include "support/simulation.h"
 
 namespace {
-
-namespace fs = std::filesystem;
-using Lines = std::vector<std::string>;
-
-constexpr char kSigned[] = "  ✓ package                signed with the payload of that key";
-
-std::string ByRsa2048() {
-  return "   com.example.vault   signer CN=rsa-2048, O=Example, RSA-2048, key 98302ce8…f64646";
-}
-
-constexpr size_t kAll = 1000;
-constexpr char kLaidOut[] =
-    "  libraries laid out beside it as an installer does; --install=no leaves it as it lies";
-
-// The first lines of all, and the status. Where something was refused, the line of the verdict has
-// the reason of the first line with a cross; here it is left out again.
-Lines WithoutReason(size_t lines, Lines all) {
-  const auto is_cross = [](const std::string& line) { return line.rfind("  ✗ ", 0) == 0; };
-  const auto cross = std::find_if(all.begin(), all.end(), is_cross);
-  if (cross != all.end()) {
-    const size_t file = all[0].find("  ") + 2;
-    const size_t reason = all[0].find("   ", file);
-    EXPECT_NE(reason, std::string::npos) << all[0];
-    const size_t end = std::min(all[0].find("   ", reason + 3), all[0].size());
-    std::string why = all[0].substr(reason + 3, end - reason - 3);
-    if (why.rfind("lib/", 0) == 0) {
-      EXPECT_EQ(cross->find(why.substr(0, why.find(": "))), std::string("  ✗ ").size());
-      why = why.substr(why.find(": ") + 2);
-    }
-    EXPECT_EQ(cross->substr(cross->size() - std::min(cross->size(), why.size())), why);
-    EXPECT_NE(why, "");
-    all[0].resize(reason);
-  }
-  const std::string status = all.back();
-  all.resize(std::min(all.size() - 1, lines));
-  all.push_back(status);
-  return all;
-}
-
-// A copy of a golden package with its libraries beside it, for a test to spoil.
-class Reason : public testing::Test {
- protected:
-  // `name` is a directory of make_golden_packages, or a package in it.
-  void Take(const std::string& name) {
-    const fs::path source = fs::path(GOLDEN_PACKAGES) / name;
-    if (fs::is_directory(source)) {
-      fs::copy(source, directory_.path(), fs::copy_options::recursive);
-    } else {
-      fs::copy_file(source, directory_ / "base.apk");
-    }
-  }
-
-  // A shell command in the package's directory.
-  void Do(const std::string& command) const {
-    const ProcessResult run = RunProcess({"bash", "-e", "-c", command}, directory_.path());
-    ASSERT_EQ(run.status, 0) << run.errors;
-  }
-
-  Lines Told(size_t lines, const Lines& options = {}, const std::string& file = "base.apk",
-             const Lines& before = {}) const {
-    Lines words = options;
-    words.push_back(file);
-    return WithoutReason(lines, FirstLines(kAll, words, {before, directory_.path()}));
-  }
-
-  const TempDir directory_;
-};
 
 TEST_F(Reason, Unsigned) {
   Take("unsigned.apk");
@@ -290,7 +220,7 @@ TEST_F(Reason, MissingFile) {
 TEST_F(Reason, NoPermission) {
   if (!CanMakeNamespaces()) GTEST_SKIP() << kNoNamespaces;
   Take("apksigner-sha256-2048");
-  fs::permissions(directory_ / "base.apk", fs::perms::none);
+  std::filesystem::permissions(directory_ / "base.apk", std::filesystem::perms::none);
   EXPECT_EQ(
       Told(2, {}, "base.apk", {"unshare", "-U"}),
       Lines({"NOT LOOKED AT  base.apk", "  ✗ file  not looked at: it may not be read", "-> 4"}));
@@ -316,18 +246,6 @@ TEST_F(Reason, ClosedStandardInput) {
                    "  ✗ file  not looked at: standard input is closed, so the file got "
                    "descriptor 0, which the tool takes for a failure",
                    "-> 4"}));
-}
-
-TEST_F(Reason, TamperedLibrary) {
-  Take("apksigner-sha256-2048");
-  Do("echo >>lib/arm64/libvault.so");
-  EXPECT_EQ(Told(7),
-            Lines({"PARTLY SIGNED  base.apk", kSigned,
-                   "  ✗ lib/arm64/libvault.so  not signed: its bytes are not those that the "
-                   "manifest lists",
-                   "      The file beside the package was changed after it was installed. Install",
-                   "      the package again.", "  ✓ lib/arm/libvault.so    signed",
-                   "  ✓ key                    registered for com.example.vault", "-> 1"}));
 }
 
 TEST_F(Reason, TamperedDexFile) {
@@ -406,16 +324,6 @@ TEST_F(Reason, EncryptedEntryThatTheToolReads) {
 }
 
 // The installation leaves it out, and the tool cannot read it either.
-TEST_F(Reason, EncryptedLibraryOfALonelyPackage) {
-  Take("apksigner-sha256-2048");
-  Do("rm -r lib; unzip -q base.apk 'lib/*'; zip -q -P word base.apk lib/arm64-v8a/*; rm -r lib");
-  EXPECT_EQ(Told(4, {"--install"}),
-            Lines({"PARTLY SIGNED  base.apk", kSigned,
-                   "  ✗ lib/arm64/libvault.so  not signed: lib/arm64-v8a/libvault.so is encrypted, "
-                   "and no phone decrypts it",
-                   "      Build the package again without a password.", "-> 1"}));
-}
-
 TEST_F(Reason, ArchivesThatAreNoPackage) {
   Take("apksigner-sha256-2048");
   Do("touch BundleConfig.pb; zip -q app.aab BundleConfig.pb; zip -q set.apks base.apk;"
@@ -440,14 +348,6 @@ TEST_F(Reason, ArchivesThatAreNoPackage) {
   EXPECT_EQ(Told(2)[1].substr(0, 50), "  ✗ JAR  not signed: it has parts of a package (");
 }
 
-TEST_F(Reason, LibraryInASubdirectoryOfItsAbi) {
-  MakePackage(WithLibraries({{"lib/arm64-v8a/sub/libx.so", ToBytes("x")}}))
-      .WriteTo(directory_ / "base.apk");
-  EXPECT_EQ(Told(5)[2],
-            "  – lib/arm64/sub/libx.so  nothing to sign: it is in a subdirectory of its ABI: the "
-            "tool looks for lib/arm64/sub/libx.so, and installers do not put it there");
-}
-
 TEST_F(Reason, KeyOf512BitsIsSignedWithAWarning) {
   PackageOptions options;
   options.block.key = "rsa-512";
@@ -459,33 +359,6 @@ TEST_F(Reason, KeyOf512BitsIsSignedWithAWarning) {
   EXPECT_NE(std::find(told.begin(), told.end(),
                       "  ! its RSA key has 512 bits; fewer than 2048 bits are not safe"),
             told.end());
-}
-
-// Phones install the libraries of one processor, and so they are no refusal.
-TEST_F(Reason, LibrariesOfAnotherProcessorAreNotLaidOut) {
-  Take("apksigner-sha256-2048");
-  Do("rm -r lib");
-  const std::string other =
-      "nothing to sign: it is for another processor than the phone's (--install=all lays out those "
-      "of all)";
-  EXPECT_EQ(
-      Told(6, {"--install", "--strict"}),
-      Lines({"SIGNED  base.apk" + ByRsa2048(), kSigned, "  ✓ lib/arm64/libvault.so  signed",
-             "  – lib/arm/libvault.so    " + other,
-             "  ✓ key                    registered for com.example.vault", kLaidOut, "-> 0"}));
-  EXPECT_EQ(Told(4, {"--install=arm", "--strict"}),
-            Lines({"SIGNED  base.apk" + ByRsa2048(), kSigned, "  – lib/arm64/libvault.so  " + other,
-                   "  ✓ lib/arm/libvault.so    signed", "-> 0"}));
-  EXPECT_EQ(Told(4, {"--install=all", "--strict"}).back(), "-> 0");
-}
-
-// A library that was asked for and is missing stays a refusal.
-TEST_F(Reason, StrictRefusesALibraryThatNoInstallerTakes) {
-  MakePackage(WithLibraries({{"lib/arm64-v8a/libx.so", ToBytes("x")},
-                             {"lib/arm64-v8a/sub/liby.so", ToBytes("y")}}))
-      .WriteTo(directory_ / "base.apk");
-  EXPECT_EQ(Told(1, {"--install", "--strict"}).back(), "-> 1");
-  EXPECT_EQ(Told(1, {"--install"}).back(), "-> 0");
 }
 
 // The command that is told makes a certificate for the same key that the tool takes.
@@ -510,77 +383,6 @@ TEST_F(Reason, CertificateWithSha384IsCuredByTheCommandThatIsTold) {
      "keytool -list -v -keystore key.p12 -storepass android >listed");
   EXPECT_EQ(Told(1)[0].substr(0, 16), "SIGNED  base.apk");
   EXPECT_NE(ContentOf(directory_ / "listed").find("SHA256withRSA"), std::string::npos);
-}
-
-// The package alone, as a store delivers it.
-TEST_F(Reason, LibrariesThatDoNotLieBesideThePackage) {
-  Take("apksigner-sha256-2048");
-  Do("rm -r lib");
-  const std::string absent =
-      "nothing to sign: no libraries for its processor are beside the package";
-  EXPECT_EQ(
-      Told(7),
-      Lines({"SIGNED  base.apk" + ByRsa2048(), kSigned, "  – lib/arm64/libvault.so  " + absent,
-             "  – lib/arm/libvault.so    " + absent,
-             "      Nothing to do for a phone with another processor. To lay out the libraries",
-             "      of all processors, give --install=all.",
-             "  ✓ key                    registered for com.example.vault", "-> 0"}));
-  EXPECT_EQ(Told(1, {"--strict"}), Lines({"PARTLY SIGNED  base.apk", "-> 1"}));
-  EXPECT_EQ(Told(5, {"--install=all"}),
-            Lines({"SIGNED  base.apk" + ByRsa2048(), kSigned, "  ✓ lib/arm64/libvault.so  signed",
-                   "  ✓ lib/arm/libvault.so    signed",
-                   "  ✓ key                    registered for com.example.vault", "-> 0"}));
-  EXPECT_EQ(Told(4, {"--install"})[2], "  ✓ lib/arm64/libvault.so  signed");
-}
-
-// A store's package is looked at as phones have it, and nobody has to ask for that.
-TEST_F(Reason, PackageThatLiesAloneIsLaidOut) {
-  Take("apksigner-sha256-2048");
-  Do("rm -r lib");
-  const auto run = [this] {
-    return RunProcess({"env", "LC_ALL=C.UTF-8", SimulatorPath(), "--installer=off", "base.apk"},
-                      directory_.path());
-  };
-  const ProcessResult alone = run();
-  EXPECT_EQ(alone.status, 0);
-  EXPECT_NE(alone.output.find("  ✓ lib/arm64/libvault.so  signed\n"), std::string::npos);
-  EXPECT_NE(alone.output.find(std::string("\n") + kLaidOut + "\n"), std::string::npos);
-  // One of the installer's directories is there, and so it was installed.
-  for (const std::string place : {"lib/arm64", "lib/arm"}) {
-    Do("rm -rf lib; mkdir -p " + place);
-    const ProcessResult installed = run();
-    EXPECT_NE(installed.output.find("  – lib/arm64/libvault.so  nothing to sign: "),
-              std::string::npos)
-        << installed.output;
-    EXPECT_EQ(installed.output.find("laid out"), std::string::npos);
-  }
-  // Another directory of that name is nobody's.
-  Do("rm -rf lib; mkdir lib");
-  EXPECT_EQ(run().output, alone.output);
-}
-
-TEST_F(Reason, LibraryOfOneProcessorThatWasNotInstalled) {
-  Take("apksigner-sha256-2048");
-  Do("rm -r lib/arm");
-  EXPECT_EQ(Told(4)[2], "  ✓ lib/arm64/libvault.so  signed");
-  EXPECT_EQ(Told(4)[3],
-            "  – lib/arm/libvault.so    nothing to sign: no libraries for its processor are beside "
-            "the package");
-}
-
-TEST_F(Reason, LibrariesThatThePackageKeeps) {
-  Take("kept-libraries");
-  Do("rm -r lib");
-  const std::string kept =
-      "nothing to sign: it stays inside the package (extractNativeLibs=\"false\")";
-  EXPECT_EQ(Told(6),
-            Lines({"SIGNED  base.apk" + ByRsa2048(),
-                   "  ✓ package                 signed with the payload of that key",
-                   "  – lib/arm64/libvault.so   " + kept, "  – lib/arm/libvault.so     " + kept,
-                   "      Nothing to do: it is loaded from the package.",
-                   "  – lib/x86_64/libvault.so  nothing to sign: no phone of this kind installs it",
-                   "-> 0"}));
-  EXPECT_EQ(Told(3, {"--install=all"})[2], "  – lib/arm64/libvault.so   " + kept);
 }
 
 TEST_F(Reason, Jar) {

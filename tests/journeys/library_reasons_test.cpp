@@ -1,0 +1,139 @@
+// Why a library of a real package is not signed, in the words of the simulator.
+#include "journeys/reason.h"
+
+#include "support/package.h"
+
+namespace {
+
+constexpr char kLaidOut[] =
+    "  libraries laid out beside it as an installer does; --install=no leaves it as it lies";
+
+TEST_F(Reason, TamperedLibrary) {
+  Take("apksigner-sha256-2048");
+  Do("echo >>lib/arm64/libvault.so");
+  EXPECT_EQ(Told(7),
+            Lines({"PARTLY SIGNED  base.apk", kSigned,
+                   "  ✗ lib/arm64/libvault.so  not signed: its bytes are not those that the "
+                   "manifest lists",
+                   "      The file beside the package was changed after it was installed. Install",
+                   "      the package again.", "  ✓ lib/arm/libvault.so    signed",
+                   "  ✓ key                    registered for com.example.vault", "-> 1"}));
+}
+
+TEST_F(Reason, EncryptedLibraryOfALonelyPackage) {
+  Take("apksigner-sha256-2048");
+  Do("rm -r lib; unzip -q base.apk 'lib/*'; zip -q -P word base.apk lib/arm64-v8a/*; rm -r lib");
+  EXPECT_EQ(Told(4, {"--install"}),
+            Lines({"PARTLY SIGNED  base.apk", kSigned,
+                   "  ✗ lib/arm64/libvault.so  not signed: lib/arm64-v8a/libvault.so is encrypted, "
+                   "and no phone decrypts it",
+                   "      Build the package again without a password.", "-> 1"}));
+}
+
+TEST_F(Reason, LibraryInASubdirectoryOfItsAbi) {
+  MakePackage(WithLibraries({{"lib/arm64-v8a/sub/libx.so", ToBytes("x")}}))
+      .WriteTo(directory_ / "base.apk");
+  EXPECT_EQ(Told(5)[2],
+            "  – lib/arm64/sub/libx.so  nothing to sign: it is in a subdirectory of its ABI: the "
+            "tool looks for lib/arm64/sub/libx.so, and installers do not put it there");
+}
+
+// Phones install the libraries of one processor, and so they are no refusal.
+TEST_F(Reason, LibrariesOfAnotherProcessorAreNotLaidOut) {
+  Take("apksigner-sha256-2048");
+  Do("rm -r lib");
+  const std::string other =
+      "nothing to sign: it is for another processor than the phone's (--install=all lays out those "
+      "of all)";
+  EXPECT_EQ(
+      Told(6, {"--install", "--strict"}),
+      Lines({"SIGNED  base.apk" + ByRsa2048(), kSigned, "  ✓ lib/arm64/libvault.so  signed",
+             "  – lib/arm/libvault.so    " + other,
+             "  ✓ key                    registered for com.example.vault", kLaidOut, "-> 0"}));
+  EXPECT_EQ(Told(4, {"--install=arm", "--strict"}),
+            Lines({"SIGNED  base.apk" + ByRsa2048(), kSigned, "  – lib/arm64/libvault.so  " + other,
+                   "  ✓ lib/arm/libvault.so    signed", "-> 0"}));
+  EXPECT_EQ(Told(4, {"--install=all", "--strict"}).back(), "-> 0");
+}
+
+// A library that was asked for and is missing stays a refusal.
+TEST_F(Reason, StrictRefusesALibraryThatNoInstallerTakes) {
+  MakePackage(WithLibraries({{"lib/arm64-v8a/libx.so", ToBytes("x")},
+                             {"lib/arm64-v8a/sub/liby.so", ToBytes("y")}}))
+      .WriteTo(directory_ / "base.apk");
+  EXPECT_EQ(Told(1, {"--install", "--strict"}).back(), "-> 1");
+  EXPECT_EQ(Told(1, {"--install"}).back(), "-> 0");
+}
+
+// The package alone, as a store delivers it.
+TEST_F(Reason, LibrariesThatDoNotLieBesideThePackage) {
+  Take("apksigner-sha256-2048");
+  Do("rm -r lib");
+  const std::string absent =
+      "nothing to sign: no libraries for its processor are beside the package";
+  EXPECT_EQ(
+      Told(7),
+      Lines({"SIGNED  base.apk" + ByRsa2048(), kSigned, "  – lib/arm64/libvault.so  " + absent,
+             "  – lib/arm/libvault.so    " + absent,
+             "      Nothing to do for a phone with another processor. To lay out the libraries",
+             "      of all processors, give --install=all.",
+             "  ✓ key                    registered for com.example.vault", "-> 0"}));
+  EXPECT_EQ(Told(1, {"--strict"}), Lines({"PARTLY SIGNED  base.apk", "-> 1"}));
+  EXPECT_EQ(Told(5, {"--install=all"}),
+            Lines({"SIGNED  base.apk" + ByRsa2048(), kSigned, "  ✓ lib/arm64/libvault.so  signed",
+                   "  ✓ lib/arm/libvault.so    signed",
+                   "  ✓ key                    registered for com.example.vault", "-> 0"}));
+  EXPECT_EQ(Told(4, {"--install"})[2], "  ✓ lib/arm64/libvault.so  signed");
+}
+
+// A store's package is looked at as phones have it, and nobody has to ask for that.
+TEST_F(Reason, PackageThatLiesAloneIsLaidOut) {
+  Take("apksigner-sha256-2048");
+  Do("rm -r lib");
+  const auto run = [this] {
+    return RunProcess({"env", "LC_ALL=C.UTF-8", SimulatorPath(), "--installer=off", "base.apk"},
+                      directory_.path());
+  };
+  const ProcessResult alone = run();
+  EXPECT_EQ(alone.status, 0);
+  EXPECT_NE(alone.output.find("  ✓ lib/arm64/libvault.so  signed\n"), std::string::npos);
+  EXPECT_NE(alone.output.find(std::string("\n") + kLaidOut + "\n"), std::string::npos);
+  // One of the installer's directories is there, and so it was installed.
+  for (const std::string place : {"lib/arm64", "lib/arm"}) {
+    Do("rm -rf lib; mkdir -p " + place);
+    const ProcessResult installed = run();
+    EXPECT_NE(installed.output.find("  – lib/arm64/libvault.so  nothing to sign: "),
+              std::string::npos)
+        << installed.output;
+    EXPECT_EQ(installed.output.find("laid out"), std::string::npos);
+  }
+  // Another directory of that name is nobody's.
+  Do("rm -rf lib; mkdir lib");
+  EXPECT_EQ(run().output, alone.output);
+}
+
+TEST_F(Reason, LibraryOfOneProcessorThatWasNotInstalled) {
+  Take("apksigner-sha256-2048");
+  Do("rm -r lib/arm");
+  EXPECT_EQ(Told(4)[2], "  ✓ lib/arm64/libvault.so  signed");
+  EXPECT_EQ(Told(4)[3],
+            "  – lib/arm/libvault.so    nothing to sign: no libraries for its processor are beside "
+            "the package");
+}
+
+TEST_F(Reason, LibrariesThatThePackageKeeps) {
+  Take("kept-libraries");
+  Do("rm -r lib");
+  const std::string kept =
+      "nothing to sign: it stays inside the package (extractNativeLibs=\"false\")";
+  EXPECT_EQ(Told(6),
+            Lines({"SIGNED  base.apk" + ByRsa2048(),
+                   "  ✓ package                 signed with the payload of that key",
+                   "  – lib/arm64/libvault.so   " + kept, "  – lib/arm/libvault.so     " + kept,
+                   "      Nothing to do: it is loaded from the package.",
+                   "  – lib/x86_64/libvault.so  nothing to sign: no phone of this kind installs it",
+                   "-> 0"}));
+  EXPECT_EQ(Told(3, {"--install=all"})[2], "  – lib/arm64/libvault.so   " + kept);
+}
+
+}  // namespace

@@ -1,0 +1,77 @@
+// Looks at a package with the simulator, and returns the first lines of its answer.
+#pragma once
+
+#include <gtest/gtest.h>
+
+#include <algorithm>
+#include <filesystem>
+#include <string>
+#include <vector>
+
+#include "support/files.h"
+#include "support/process.h"
+#include "support/simulation.h"
+
+using Lines = std::vector<std::string>;
+
+inline constexpr char kSigned[] = "  ✓ package                signed with the payload of that key";
+
+inline std::string ByRsa2048() {
+  return "   com.example.vault   signer CN=rsa-2048, O=Example, RSA-2048, key 98302ce8…f64646";
+}
+
+inline constexpr size_t kAll = 1000;
+
+// The first lines of all, and the status. Where something was refused, the line of the verdict has
+// the reason of the first line with a cross; here it is left out again.
+inline Lines WithoutReason(size_t lines, Lines all) {
+  const auto is_cross = [](const std::string& line) { return line.rfind("  ✗ ", 0) == 0; };
+  const auto cross = std::find_if(all.begin(), all.end(), is_cross);
+  if (cross != all.end()) {
+    const size_t file = all[0].find("  ") + 2;
+    const size_t reason = all[0].find("   ", file);
+    EXPECT_NE(reason, std::string::npos) << all[0];
+    const size_t end = std::min(all[0].find("   ", reason + 3), all[0].size());
+    std::string why = all[0].substr(reason + 3, end - reason - 3);
+    if (why.rfind("lib/", 0) == 0) {
+      EXPECT_EQ(cross->find(why.substr(0, why.find(": "))), std::string("  ✗ ").size());
+      why = why.substr(why.find(": ") + 2);
+    }
+    EXPECT_EQ(cross->substr(cross->size() - std::min(cross->size(), why.size())), why);
+    EXPECT_NE(why, "");
+    all[0].resize(reason);
+  }
+  const std::string status = all.back();
+  all.resize(std::min(all.size() - 1, lines));
+  all.push_back(status);
+  return all;
+}
+
+// A copy of a golden package with its libraries beside it, for a test to spoil.
+class Reason : public testing::Test {
+ protected:
+  // `name` is a directory of make_golden_packages, or a package in it.
+  void Take(const std::string& name) {
+    const std::filesystem::path source = std::filesystem::path(GOLDEN_PACKAGES) / name;
+    if (std::filesystem::is_directory(source)) {
+      std::filesystem::copy(source, directory_.path(), std::filesystem::copy_options::recursive);
+    } else {
+      std::filesystem::copy_file(source, directory_ / "base.apk");
+    }
+  }
+
+  // A shell command in the package's directory.
+  void Do(const std::string& command) const {
+    const ProcessResult run = RunProcess({"bash", "-e", "-c", command}, directory_.path());
+    ASSERT_EQ(run.status, 0) << run.errors;
+  }
+
+  Lines Told(size_t lines, const Lines& options = {}, const std::string& file = "base.apk",
+             const Lines& before = {}) const {
+    Lines words = options;
+    words.push_back(file);
+    return WithoutReason(lines, FirstLines(kAll, words, {before, directory_.path()}));
+  }
+
+  const TempDir directory_;
+};
