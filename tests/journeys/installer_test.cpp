@@ -73,7 +73,7 @@ TEST(Installer, RefusesAPackageWithoutItsDex) {
                                         "-> 1"}));
 }
 
-// The tool looks at the library that lies beside the package.
+// The tool looks at the library beside the package.
 TEST(Installer, RefusesALibraryChangedInsideThePackage) {
   EXPECT_EQ(Told("changed-inside"),
             Lines({"NOT INSTALLABLE",

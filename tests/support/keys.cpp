@@ -11,7 +11,7 @@
 
 namespace {
 
-// On a phone, the keys lie beside the program. A suite that separates programs by processor has
+// On a phone, the keys are beside the program. A suite that separates programs by processor has
 // them one directory above. (Not found by readlink: tests have the linker wrap it.)
 std::string KeysDirectory() {
   const std::string keys = TEST_KEYS_DIR;

@@ -307,7 +307,7 @@ TEST(PackageFacts, TellWhatLiesWhereTheToolLooksForALibrary) {
   EXPECT_EQ(found["lib/x86/other.so"].place, "");
 }
 
-// Libraries lie beside the file itself, and not beside a link to it.
+// Libraries are beside the file itself, and not beside a link to it.
 TEST(PackageFacts, LibrariesAreLookedForBesideTheFileItself) {
   const TempDir directory;
   MakePackage().WriteTo(directory.File("app/base.apk"));
