@@ -2,6 +2,7 @@
 
 #include <gtest/gtest.h>
 
+#include "simulator/show/good_report.h"
 #include "simulator/show/hostile_report.h"
 #include "support/files.h"
 #include "support/process.h"
@@ -10,16 +11,8 @@ using namespace simulator;
 
 namespace {
 
-Report Good(const std::string& file) {
-  Report report;
-  report.file = file;
-  report.verdict = Verdict::kSigned;
-  report.items = {{ItemKind::kPackage, "package", "", ItemState::kDone, {}}};
-  return report;
-}
-
 Report Refused(const std::string& file, Verdict verdict, const Cause* cause) {
-  Report report = Good(file);
+  Report report = GoodReport(file);
   report.verdict = verdict;
   report.items = {{ItemKind::kPackage, "package", "", ItemState::kRefused, {cause, "why"}}};
   return report;
@@ -50,10 +43,10 @@ TEST(Junit, BeginsAsALaterRunExpectsItOfWhatItReplaces) {
 }
 
 TEST(Junit, HasACaseForEachFileAndCountsThem) {
-  Report doubtful = Good("d.apk");
+  Report doubtful = GoodReport("d.apk");
   doubtful.warnings = {{&cause::kWeakKey, "1024"}};
   const std::string read = ReadByPython(
-      XmlOf({Good("a.apk"), Refused("b.apk", Verdict::kRefused, &cause::kToolError),
+      XmlOf({GoodReport("a.apk"), Refused("b.apk", Verdict::kRefused, &cause::kToolError),
              Refused("c.apk", Verdict::kNotSimulated, &cause::kToolNotStarted), doubtful}));
   const std::string counts = "('errors', '1'), ('failures', '1'), ('name', 'apktoolkit-sim'), ";
   EXPECT_EQ(
@@ -81,7 +74,7 @@ TEST(Junit, HasACaseForEachFileAndCountsThem) {
 }
 
 TEST(Junit, SaysThatTheInstallerWasNotAsked) {
-  Report unasked = Good("a.apk");
+  Report unasked = GoodReport("a.apk");
   unasked.installer = {Judgement::State::kMissing, "there is no java", {}};
   EXPECT_NE(ReadByPython(XmlOf({unasked}))
                 .find("system-out [] \"warning: no phone's installer was asked: there is no java"),
@@ -107,7 +100,7 @@ TEST(Junit, OnlyWhatEndsWithStatusZeroPasses) {
   };
   for (const auto& [verdict, element] : kExpected) {
     // Be the item that says why there or not.
-    Report bare = Good("a");
+    Report bare = GoodReport("a");
     bare.verdict = verdict;
     for (const Report& report : {Refused("a", verdict, &cause::kToolError), bare}) {
       const std::string xml = XmlOf({report});

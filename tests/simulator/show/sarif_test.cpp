@@ -3,17 +3,16 @@
 #include <gtest/gtest.h>
 
 #include "simulator/phone/probe_run.h"
+#include "simulator/show/good_report.h"
 #include "simulator/show/hostile_report.h"
 
 using namespace simulator;
 
 namespace {
 
+// With what a log has of the file.
 Report Good(const std::string& file) {
-  Report report;
-  report.file = file;
-  report.verdict = Verdict::kSigned;
-  report.items = {{ItemKind::kPackage, "package", "", ItemState::kDone, {}}};
+  Report report = GoodReport(file);
   report.file_size = 7;
   report.file_sha256 = std::string(64, 'a');
   return report;
