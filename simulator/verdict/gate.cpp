@@ -193,7 +193,7 @@ std::string DigestsText(const CertificateFacts& signer) {
   add(signer.sha256, "the certificate");
   add(signer.key.sha256, "the public key");
   add(signer.key.modulus_sha256, "the modulus");
-  return (signer.subject.empty() ? "nobody that others read" : signer.subject) + " (" +
+  return (signer.subject.empty() ? "a signer without a readable name" : signer.subject) + " (" +
          (digests.empty() ? "no digest is known" : digests) + ")";
 }
 

@@ -129,6 +129,19 @@ TEST(Gate, SaysWhoIsExpectedAndWhoSigned) {
                 kOther.key.modulus_sha256 + ")");
 }
 
+TEST(Gate, SaysThatASignerHasNoReadableName) {
+  GateOptions options;
+  options.signers = {kOwner.sha256};
+  Report report = SignedBy(kOther);
+  report.signer.reset();
+  Gate(options).Judge(&report);
+  EXPECT_EQ(report.items[1].reason.Text(),
+            "its signer is not one that --signer names: expected " + kOwner.sha256 +
+                ", and the JAR signature is by a signer without a readable name (SHA-256 digest of "
+                "the modulus " +
+                kOther.key.modulus_sha256 + ")");
+}
+
 // The kernel gets the modulus. A certificate that shows another key is a decoy.
 TEST(Gate, CertificateOfAnotherKeyThanTheKernelGetsCountsForNothing) {
   Report report = SignedBy(kOwner);
