@@ -10,7 +10,7 @@
 #include <vector>
 
 // A piece of the text, in bytes from its start. 32 bits are enough for any entry of an archive, and
-// they keep the table small: a large manifest has some hundred thousand pieces.
+// they keep the table small: a large manifest has several hundred thousand pieces.
 struct ManifestPiece {
   uint32_t start = 0;
   uint32_t length = 0;
@@ -84,8 +84,8 @@ class ManifestSections {
   // The parser fills the table with the three functions below. reset removes all sections. The
   // attributes that are added after it are pieces of the `size` bytes at `text`.
   void reset(const uint8_t* text, size_t size);
-  // Adds an attribute to the open section. Its name and its value are not empty. Repeated names
-  // take no memory.
+  // Adds an attribute to the open section. Its name and its value are not empty. A repeated name
+  // takes memory only until the section is sorted the next time.
   void add(const ManifestAttribute& attribute);
   // Ends the open section, which may be empty. Only ended sections are visible.
   void endSection();
@@ -98,6 +98,6 @@ class ManifestSections {
 
   const char* text_ = nullptr;
   std::vector<ManifestAttribute> attributes_;
-  std::vector<uint32_t> ends_;     // of each section in attributes_
-  size_t patience_ = kLittleText;  // the offset in the text at which the open section is sorted
+  std::vector<uint32_t> ends_;     // the index in attributes_ at which each section ends
+  size_t patience_ = kLittleText;  // the text offset from which the open section is sorted again
 };

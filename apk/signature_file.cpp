@@ -91,8 +91,8 @@ bool Apk::VerifyCertificate(std::vector<uint8_t>& block, std::vector<uint8_t>& s
     LogError("RSA could not verify data: %X\n", static_cast<unsigned>(result));
     return false;
   }
-  // Deliberate: longer keys never verify above, so no test gets here. The guard protects the users
-  // of the key, which have no room for more.
+  // Deliberate: longer keys never verify above, so no test reaches this line. The guard protects
+  // the code that uses the key and has no room for a longer one.
   if (record.modulus_length > kLongestKey) return false;
   key.assign(record.modulus, record.modulus + record.modulus_length);
   return true;
@@ -119,9 +119,9 @@ bool Apk::ValidateManifest(const std::vector<uint8_t>& manifest) {
 
 bool Apk::VerifyData(const std::string& digest_name, const std::vector<uint8_t>& expected,
                      const std::vector<uint8_t>& data) {
-  // Deliberate: only these two digests. Every manifest that a package's signing tool wrote has one
-  // of them. Others (MD5, SHA-512) are refused. Signatures differ: those of old packages are over
-  // MD5, and they verify.
+  // Deliberate: only these two digests are supported. Every manifest that a package's signing tool
+  // wrote has one of them. Others (MD5, SHA-512) are refused. Signatures have another rule: old
+  // packages have signatures over MD5, and these verify.
   std::vector<uint8_t> computed;
   if (digest_name == "SHA1-Digest") {
     ComputeSHA1Digest(data, computed);

@@ -1,5 +1,6 @@
-// bench_floor FILE: the least that the tool's job can cost. It opens the archive, extracts and
-// digests the same bytes as the tool and writes the same log. It verifies nothing.
+// bench_floor FILE: measures the lowest possible cost of the tool's job. The program opens the
+// archive, extracts and digests the same bytes as the tool, and writes the same log. It verifies
+// nothing.
 #include <openssl/md5.h>
 #include <openssl/sha.h>
 

@@ -1,5 +1,5 @@
-// Measures parts of the tool: its arithmetic, beside that of the platform's libcrypto and of GMP,
-// and its readers of text.
+// Measures the tool's arithmetic and its text parsers. The platform's libcrypto and GMP are
+// measured for comparison.
 #include <benchmark/benchmark.h>
 #include <gmp.h>
 #include <openssl/bn.h>
@@ -21,8 +21,7 @@ namespace {
 
 std::string KeyOf(const benchmark::State& state) { return "rsa-" + std::to_string(state.range(0)); }
 
-// The modulus of the test key, as bytes and as limbs, and another number of the same length below
-// it.
+// The modulus of the test key, as bytes and as limbs, and a smaller number of the same length.
 struct Operands {
   explicit Operands(const std::string& key) : modulus(ModulusOf(key)) {
     mpi_from_bytes(&N, modulus.data(), modulus.size());
@@ -71,8 +70,7 @@ BENCHMARK(ModMpi)->Name("mpi_mod_mpi")->Arg(1024)->Arg(2048)->Arg(4096);
 
 const Bytes kSigned(1000, 'x');
 
-// A public operation with a key that was not used before. Loading the key from its bytes is
-// included.
+// A public operation. Each iteration loads the key from its bytes. The time for that is included.
 void Tool(benchmark::State& state) {
   const Bytes modulus = ModulusOf(KeyOf(state));
   const Bytes signature = SignWith(KeyOf(state), Digest::kSha256, kSigned);

@@ -1,4 +1,4 @@
-"""bench/report.py BUILD-DIRECTORY: measures the tool against floor and peer, prints one table, and
+"""bench/report.py BUILD-DIRECTORY: measures the tool, the floor and the peer, prints the tables, and
 writes the numbers and plots of docs/performance.md. scripts/bench calls it."""
 
 import collections
@@ -18,8 +18,9 @@ TOOL, FLOOR, PEER = (f'{BUILD}/bin/{name}' for name in ('apktoolkit', 'bench_flo
 MICRO = [f'{BUILD}/bench/bench_micro', f'{BUILD}/bench/bench_micro_openssl']
 DOCUMENT = 'docs/performance.md'
 
-# Rounds; the most that the tool may cost, as a ratio to the floor, to the peer, and of memory to
-# the floor's (None: no target); and the margin of all three ratios.
+# rounds: how often each program runs. floor, peer: the greatest allowed ratio of the tool's time to
+# theirs. memory: the greatest allowed ratio of the tool's memory to the floor's. None: no target.
+# margin: the part by which each ratio may exceed its target.
 Package = collections.namedtuple('Package', 'name rounds floor peer memory margin')
 PACKAGES = [
     Package('small', 101, 1.07, 0.90, 1.03, 0.05),
@@ -83,7 +84,7 @@ def measure(package):
 
 
 def expect_same_log(package):
-    """The three programs did the same job if they wrote the same log."""
+    """Exits unless the three programs wrote the same log: then they did the same job."""
     logs = {re.sub(r'\d\d-\d\d \d\d:\d\d:\d\d +\d+ +\d+', '', subprocess.run(
         [program, package_path(package.name)], check=True, capture_output=True, text=True).stderr)
         for program in (TOOL, FLOOR, PEER)}
@@ -96,7 +97,7 @@ def median(runs, column):
 
 
 def ratio(runs, other, column):
-    """The median of the ratios of runs that followed one another."""
+    """The median ratio of the tool's runs to the runs of `other` in the same rounds."""
     return statistics.median(a[column] / b[column] for a, b in zip(runs[TOOL], runs[other]))
 
 
@@ -194,7 +195,7 @@ def instructions_per_limb(limbs=128):
 # ---- Parts.
 
 def measure_micro():
-    """Nanoseconds of processor time by name: the medians of runs in turns."""
+    """The processor time of each benchmark by its name, in nanoseconds: the median of three runs."""
     samples = collections.defaultdict(list)
     for _ in range(3):
         for program in MICRO:
@@ -248,13 +249,14 @@ def text_table():
         yield '| ' + ' | '.join(cells) + ' |'
 
 
-# The part that a sample counts for, by the file that it fell into. The first match wins.
+# Each part has a pattern. A sample counts for the first part whose pattern matches the sample's
+# file.
 PARTS = (('start-up', r'/ld-linux'), ('kernel', r'kernel'), ('inflate', r'/libz\.'),
          ('digests', r'/libcrypto\.'), ("the tool's own code", r'/apktoolkit$'), ('libraries', r''))
 
 
 def measure_parts(package):
-    """Shares of the processor time; None if perf is missing."""
+    """Each part's share of the processor time; None if perf is missing or fails."""
     data = f'{BUILD}/perf.data'
     run = [f'{BUILD}/bench/bench_run', str(package.rounds // 3), TOOL, '/bin/true', '--',
            package_path(package.name)]

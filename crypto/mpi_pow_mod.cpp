@@ -13,7 +13,7 @@ struct montgomery {
   uint32_t mm;
   mpi_local T;
 
-  // X = A, with enough limbs for a product to replace it.
+  // Sets X = A, and gives X enough limbs for a Montgomery product.
   int copy(mpi* X, const mpi* A) const;
   void multiply(mpi* A, const mpi* B) { mpi_montmul(A, B, N, mm, &T); }
 };
@@ -65,8 +65,9 @@ WRAPS_ON_PURPOSE uint32_t montgomery_constant(uint32_t m0) {
   return 0 - x;
 }
 
-// The window size: the number of exponent bits for one product, for an exponent of `bits` bits.
-// Deliberate: no window has 2 bits. Short exponents have few set bits in practice: 2 gain nothing.
+// Returns the window size for an exponent of `bits` bits: the number of exponent bits that one
+// product handles. Deliberate: no window has 2 bits. Short exponents have few set bits in practice,
+// so a window of 2 bits would save no time.
 int window_size(int bits) {
   return bits > 671 ? 6 : bits > 239 ? 5 : bits > 79 ? 4 : bits > 23 ? 3 : 1;
 }
@@ -102,7 +103,7 @@ void raise(mpi* X, const mpi* E, const mpi_local* W, int w, montgomery* m) {
     nbits = 0;
     wbits = 0;
   }
-  // The last window, which may have fewer than w bits.
+  // The exponent bits that are left. They are fewer than w.
   for (; nbits > 0; --nbits) {
     m->multiply(X, X);
     wbits <<= 1;

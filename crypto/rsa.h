@@ -1,8 +1,8 @@
 // RSA PKCS#1 v1.5 signature verification (RFC 8017 §8.2.2) on the tool's own integers.
 //
 // A context owns the limbs of its two numbers; an rsa_local releases them. Bytes that are passed in
-// are only read during the call. A signature is logged at error priority if its digest does not
-// match or its DigestInfo names no known digest. Every other refusal is silent.
+// are only read during the call. A refused DigestInfo is logged at error priority, except a
+// DigestInfo of MD5's length with another prefix. Every other refusal is silent.
 #pragma once
 
 #include <cstdint>
@@ -28,9 +28,9 @@ inline constexpr uint32_t kRsaMinModulusSize = 16;
 inline constexpr uint32_t kRsaMaxModulusSize = 512;
 
 // True if anyone can forge signatures for a key with this exponent. The caller refuses these keys.
-// Deliberate: only this exponent is refused, with either sign, since the sign does not count
-// (mpi_pow_mod). A number to the power of 1 is itself, so anyone could write down a signature for
-// any key (docs/decisions/exponent-of-one.md).
+// Deliberate: only 1 and -1 are refused. The arithmetic ignores the exponent's sign (mpi_pow_mod).
+// A number to the power of 1 is itself, so anyone could write down a signature for any key
+// (docs/decisions/exponent-of-one.md).
 constexpr bool rsa_is_forgeable(uint32_t exponent_value) {
   return exponent_value == 1 || exponent_value == UINT32_MAX;
 }
@@ -45,9 +45,9 @@ inline constexpr int kRsaPublicFlag = 16;
 // Loads a public key into `ctx`, which is not null. Limbs that `ctx` owned before are not freed.
 //
 // `modulus` is unsigned, big-endian, `len` bytes; null leaves the modulus empty. `exponent` has the
-// same form and length; if it is null, `exponent_value`, read as a signed number, is the exponent.
-// A `len` of 0 leaves both numbers empty and does not change the context's `len`. A context with an
-// empty modulus verifies nothing.
+// same form and length. If `exponent` is null, the exponent is `exponent_value`, read as a signed
+// number. A `len` of 0 leaves both numbers empty and does not change the context's `len`. A context
+// with an empty modulus verifies nothing.
 //
 // Returns 0, or kRsaKeyFlag | kMpiNoMemory (9) with both numbers empty.
 int rsa_set_key(rsa_context* ctx, const uint8_t* modulus, const uint8_t* exponent,
@@ -60,9 +60,10 @@ int rsa_set_key(rsa_context* ctx, const uint8_t* modulus, const uint8_t* exponen
 // Returns 0 if the signature carries the digest, and otherwise
 //   kRsaBadInput (5)        null `ctx`, `sha1` or `sig`; `len` outside 16..512; signature not below
 //                           the modulus
-//   kRsaInvalidPadding (7)  not a block of type 1 (RFC 8017 §9.2), or of no known DigestInfo length
-//                           or MD algorithm, or of SHA-256 where `sha256` is null
-//   kRsaVerifyFailed (18)   another DigestInfo prefix or digest
+//   kRsaInvalidPadding (7)  not a block of type 1 (RFC 8017 §9.2); a DigestInfo of an unknown
+//                           length; an MD algorithm other than MD5; a SHA-256 DigestInfo, but
+//                           `sha256` is null
+//   kRsaVerifyFailed (18)   the DigestInfo's prefix or digest does not match
 //   kRsaPublicFlag | kMpiNoMemory (17), kMpiBadModulus (20: the modulus is even) or
 //                           kMpiBufferTooSmall (24: the result is longer than `len` bytes)
 int rsa_pkcs1_verify(const rsa_context* ctx, const uint8_t* sha1, const uint8_t* sha256,

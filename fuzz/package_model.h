@@ -1,7 +1,8 @@
-// Computes a second time what may be done for an archive. It judges the package target. It reads
-// the archive through the platform's zip library, as the tool does. It reads texts with models.h,
-// checks signatures with libcrypto, and compares digests in one straight walk.
-// It asks the tool where a library lies; tests/apk/native_libraries_test.cpp pins those paths.
+// A model of the tool's decisions. The fuzz target for packages compares the tool's actions with
+// it. It reads the archive through the platform's zip library, as the tool does. It reads texts
+// with models.h, checks signatures with libcrypto, and compares digests. Two facts come from the
+// tool: the fields of the signature block (processCert), and the path at which a library is
+// installed. tests/crypto/pkcs7_test.cpp and tests/apk/native_libraries_test.cpp test them.
 #pragma once
 
 #include <map>
@@ -18,7 +19,7 @@ class PackageModel {
 
   // The archive holds "AndroidManifest.xml".
   bool is_package() const { return is_package_; }
-  // The package is signed by `key`, and its manifest and classes.dex are as signed.
+  // The package is signed by `key`, and its manifest and classes.dex have the signed digests.
   bool is_good() const { return is_good_; }
   const Bytes& key() const { return key_; }
   // True if one of the archive's libraries is installed at `path`, for a package in `directory`
@@ -35,8 +36,8 @@ class PackageModel {
 
   bool Judge(const Archive& archive);
   bool IsListed(const std::string& name, const Bytes& content) const;
-  // True if the signature file's first section with a digest states that of the manifest. Of
-  // several digests in the section the last counts.
+  // True if the manifest has the digest in the first section of the signature file that has a
+  // manifest digest. If that section has several, the last one counts.
   static bool StatesDigestOf(const Bytes& manifest, const ManifestModel& signature_file);
   static bool IsDigest(const std::string& attribute, const Bytes& digest, const Bytes& content);
 
@@ -47,6 +48,6 @@ class PackageModel {
   std::map<std::string, Listed> listed_;
 };
 
-// The sum of the sizes that the archive's entries declare. Entries that declare more than deflate
-// could make of their data are left out.
+// The sum of the sizes that the archive's entries declare. An entry is left out if deflate cannot
+// make the declared size from the entry's data.
 size_t DeclaredBytes(const Bytes& archive);

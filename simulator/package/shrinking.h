@@ -1,10 +1,11 @@
-// Surviving a mapped file that becomes shorter while it is read. The pages behind its new end have
-// no bytes any more, and touching them ends a process by SIGBUS.
+// Protects the process from a mapped file that becomes shorter while it is read. The pages beyond
+// the new end have no bytes, and reading them ends the process with SIGBUS.
 #pragma once
 
 namespace simulator {
 
-// While one lives, such a page reads as zeros for the thread that made it. One at a time a thread.
+// While a guard exists, the thread that made it reads zeros from such a page. A thread must not
+// have two guards at the same time.
 class ShrinkGuard {
  public:
   ShrinkGuard();
@@ -12,7 +13,7 @@ class ShrinkGuard {
   ShrinkGuard(const ShrinkGuard&) = delete;
   ShrinkGuard& operator=(const ShrinkGuard&) = delete;
 
-  // Whether a page was missing since this object was made.
+  // True if this thread has read such a page since the guard was made.
   bool HasShrunk() const;
 };
 

@@ -82,7 +82,7 @@ size_t Junit::Count(Outcome outcome) const {
 
 namespace {
 
-// A line for each item that was refused and each warning, with what to do on the line below it.
+// Returns a line for each refused item and each warning. The line below it says what to do.
 std::string DetailText(const Report& report) {
   std::string text;
   const auto add = [&text](const std::string& line, const Reason& reason) {

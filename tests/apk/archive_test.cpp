@@ -1,4 +1,4 @@
-// Finding and extracting entries, also entries that lie about themselves, and walking through all.
+// Tests how entries are found, iterated and extracted, including entries with false headers.
 #include <gtest/gtest.h>
 
 #include <algorithm>
@@ -24,7 +24,7 @@ std::vector<std::string> NamesIn(Apk& apk, const std::string& prefix, const std:
   return names;
 }
 
-// ---- Walking the entries.
+// ---- Iteration.
 
 TEST(ApkIteration, TwoEmptyTextsIterateOverAllEntries) {
   OpenPackage open(WithoutDex());
@@ -64,7 +64,7 @@ TEST(ApkIteration, AFilterThatNoNameCanHaveIsAnInvalidName) {
   EXPECT_EQ(open.apk.StartIteration(&cookie, "", std::string(0x10000, 'a')), kInvalidEntryName);
 }
 
-// ---- Entries that lie about themselves.
+// ---- Entries with false headers or damaged data.
 
 // The log for a package with this Android manifest.
 std::string LogOfAndroidManifest(const ZipItem& item) {
@@ -121,7 +121,7 @@ TEST(ApkEntries, AnEntryWhoseHeadersDisagreeIsInconsistent) {
             "Can't extract Android Manifest: Inconsistent information\n");
 }
 
-TEST(ApkEntries, AnEntryWhoseDataDescriptorLiesIsInconsistent) {
+TEST(ApkEntries, EntryWithAFalseDataDescriptorIsInconsistent) {
   ZipItem item = AndroidManifestItem(true);
   item.data_descriptor = true;
   item.descriptor.length = 5;

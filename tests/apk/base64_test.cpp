@@ -10,8 +10,8 @@
 
 namespace {
 
-// The result of base64decode() for `text` and `room` bytes of output. Memory ends behind both
-// buffers.
+// The result of base64decode() for `text` and `room` bytes of output. Unreadable memory follows
+// both buffers.
 struct Decoded {
   int result;
   size_t length;
@@ -86,15 +86,15 @@ TEST(Base64Decode, TextAfterTheFirstEqualsSignIsIgnored) {
   EXPECT_EQ(ToBytes(""), Base64Decode("=QUJD"));
 }
 
-TEST(Base64Decode, SpaceMakesItEmpty) {
+TEST(Base64Decode, TextWithASpaceBecomesEmpty) {
   EXPECT_EQ(Bytes(), Base64Decode("QUJD REVG"));
   EXPECT_EQ(Bytes(), Base64Decode(" QUJD"));
   EXPECT_EQ(Bytes(), Base64Decode("QUJD "));
 }
 
-// Each byte, alone after a whole group, is skipped, ends the text, is a left-over value, or is
-// refused.
-TEST(Base64Decode, EveryByteOutsideTheAlphabetIsRefused) {
+// Each byte value is appended to a whole group. An accepted byte is skipped, ends the text, or is a
+// left-over value. Every other byte is refused.
+TEST(Base64Decode, OnlyBytesWithAMeaningAreAccepted) {
   const std::string accepted =
       "ABCDEFGHIJKLMNOPQRSTUVWXYZabcdefghijklmnopqrstuvwxyz0123456789+/=\r\n" + std::string(1, 0);
   for (int byte = 0; byte < 256; ++byte) {

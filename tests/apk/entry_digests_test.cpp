@@ -75,7 +75,7 @@ TEST(EntryDigests, OfEqualNamesTheLaterSectionCountsInAnyOrder) {
   EXPECT_EQ("SHA-256-Digest 3", unordered.Of("b"));
 }
 
-// There are too many equal names for a sort that is stable only for a few.
+// A sort that is not stable may still keep a few equal names in order. It does not keep this many.
 TEST(EntryDigests, OfManyEqualNamesTheLastSectionCounts) {
   std::string sections = Section("z", "0");
   for (int i = 1; i <= 100; ++i) sections += Section(i % 2 == 0 ? "a" : "b", std::to_string(i));
@@ -85,19 +85,20 @@ TEST(EntryDigests, OfManyEqualNamesTheLastSectionCounts) {
   EXPECT_EQ("SHA-256-Digest 0", recorded.Of("z"));
 }
 
-// The hash of a name turns by 9 bits before each letter. After 64 letters it has turned round once.
-// Names with the same letters, 64 letters apart, therefore share a hash in any order of these
-// letters.
+// The hash of a name is rotated by 9 bits before each byte. 64 rotations are 576 bits, 9 full turns
+// of the 64-bit hash. Bytes at a distance of 64 therefore enter the hash at the same place, and
+// their order does not change it.
 std::string With64Between(const std::string& letters) {
   std::string name;
   for (const char letter : letters) name += letter + std::string(63, '/');
   return name;
 }
 
-// All names share a hash, or some do, or neighbours do. A byte that seven others follow was rotated
-// by 63 bits to the left, so an even byte was rotated by one to the right. "b" and "q" make 0x31 ^
-// 0x71, "d" and "r" 0x32 ^ 0x72, both 0x40.
-TEST(EntryDigests, NamesThatShareAHashAreToldApart) {
+// In the first family, all names share a hash. In the second, the three long names do. In the
+// third, two pairs do: the two names of 8 letters and the two long names. The first of 8 letters is
+// rotated by 63 bits to the left, which is one bit to the right. "b" becomes 0x31, and 0x31 ^ "q"
+// (0x71) is 0x40. "d" becomes 0x32, and 0x32 ^ "r" (0x72) is 0x40, too.
+TEST(EntryDigests, NamesWithEqualHashesAreDistinguished) {
   const std::vector<std::string> families[] = {
       {With64Between("abc"), With64Between("acb"), With64Between("bac"), With64Between("bca"),
        With64Between("cab")},
@@ -145,7 +146,7 @@ TEST(EntryDigests, NamesAndDigestsOnSeveralLinesAreJoined) {
   EXPECT_EQ("SHA-256-Digest 456", recorded.Of("res/drawable/b"));
 }
 
-TEST(EntryDigests, ASectionThatLacksOneOfTheThreeIsNotListed) {
+TEST(EntryDigests, SectionWithoutNameDigestOrValueIsNotListed) {
   const Recorded recorded(
       "Name: a\r\n\r\nName: b\r\nSHA1-Digest: \r\n\r\nName: \r\nSHA1-Digest: 1\r\n\r\n");
   for (const char* name : {"a", "b", ""}) EXPECT_EQ("none", recorded.Of(name)) << name;
@@ -188,7 +189,8 @@ TEST(EntryDigests, LoadingAnotherManifestForgetsTheFirst) {
   }
 }
 
-// The same with manifests of all shapes, with sorted and unsorted names, each after each.
+// The same for every pair of these manifests. Some have sorted names, some have unsorted names, and
+// the last does not parse.
 TEST(EntryDigests, NothingOfAnEarlierManifestSurvives) {
   const std::string manifests[] = {
       "",
@@ -215,7 +217,8 @@ TEST(EntryDigests, NothingOfAnEarlierManifestSurvives) {
   }
 }
 
-// The bytes after the text, and the table's former contents, would make one more section.
+// The third section is still in memory: after the end of the text, and in the table's former
+// contents. It must not be listed.
 TEST(EntryDigests, NoMoreSectionsAreListedThanThereAre) {
   const std::string two = Section("a", "1") + Section("b", "2");
   const std::string whole = two + Section("c", "3");

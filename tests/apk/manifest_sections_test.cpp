@@ -18,7 +18,7 @@ using Pairs = std::vector<std::pair<std::string, std::string>>;
 // Sections of the test's own attributes, and the text that they point into.
 class Table {
  public:
-  // The text must not move as it grows.
+  // Reserves `room` bytes, so that the text does not move when it grows.
   explicit Table(size_t room = 1 << 20) {
     text_.reserve(room);
     sections.reset(reinterpret_cast<const uint8_t*>(text_.data()), 0);
@@ -57,7 +57,7 @@ TEST(ManifestSections, AreWalkedInTheirOrder) {
   EXPECT_EQ(walked[2], PairsOf(table.sections[2]));
 }
 
-TEST(ManifestSections, OneThatHasNotEndedIsNotThere) {
+TEST(ManifestSections, OpenSectionIsNotFound) {
   Table table;
   table.Add("a", "1").End().Add("b", "2");
   EXPECT_EQ(1u, table.sections.size());
@@ -90,7 +90,7 @@ TEST(ManifestSection, FindsAnAttributeByItsWholeName) {
   for (const char* name : {"", "A", "abc", "b", "d"}) EXPECT_EQ("", section.find(name)) << name;
 }
 
-TEST(ManifestSection, FindsTheLastNameThatEndsSo) {
+TEST(ManifestSection, FindsTheLastNameWithTheSuffix) {
   Table table;
   table.Add("SHA1-X", "1")
       .Add("SHA-256-X", "2")
@@ -106,8 +106,8 @@ TEST(ManifestSection, FindsTheLastNameThatEndsSo) {
   EXPECT_EQ(std::make_pair(std::string_view(), std::string_view()), section.findLastEndingIn("-Q"));
 }
 
-// There are too many equal names for a sort that is stable only for a few. Other sections come
-// between, so that the table grows inside a section.
+// A sort that is not stable may still keep a few equal names in order. It does not keep this many.
+// The sections have different sizes, so that the table grows while a section is open.
 TEST(ManifestSection, OfEqualNamesTheLastInTheTextCounts) {
   std::mt19937 random(1);
   Table table(8 << 20);
@@ -128,8 +128,9 @@ TEST(ManifestSection, OfEqualNamesTheLastInTheTextCounts) {
   }
 }
 
-// A few long names that are alike come before very many short ones. The long names are not even
-// read until as much text has followed.
+// Two long names that differ only in their last byte come before very many short ones. The long
+// names are unreadable while the short ones are added. They must not be compared before the text
+// has advanced by their total length.
 TEST(ManifestSection, LongNamesAreComparedAgainOnlyWhenAsMuchTextHasFollowed) {
   constexpr uint32_t kLength = 1 << 20;
   constexpr size_t kAll = 3 * kLength;

@@ -10,7 +10,8 @@ namespace {
 
 constexpr int kRounds = 150000;
 
-// Dividends are random, or right beside a multiple of the divisor, where estimates fail.
+// Half of the dividends are random. The others are next to a multiple of the divisor, where
+// estimates of a digit fail.
 TEST(MpiModMpi, IsTheNonNegativeRemainder) {
   Operands operands;
   for (int round = 0; round < kRounds; ++round) {
@@ -96,11 +97,11 @@ TEST(MpiModMpi, OfTwoToThe8192ForAModulusOf128Limbs) {
   EXPECT_EQ(mpz_class(PowerOfTwo(8192) % Value(N)), Value(RR));
 }
 
-// d is 8000ffff. The half digit of 48000000 0000 is estimated as 9000, with remainder 0. From that,
-// 9000 * ffff must be subtracted. Therefore d is added, which gives d without a wrap, and is added
-// again. Code that stopped after the first would get a far too large digit and count it down by
-// ones.
-TEST(MpiModMpi, EndsAtOnceWhereTheRestComesToTheDivisor) {
+// d, the top limb of the divisor, is 8000ffff. The half digit of 48000000 0000 is estimated as
+// 9000, with remainder 0. The remainder must not be below 9000 * ffff, so d is added to it. The sum
+// is d itself: it did not wrap, and d must be added again. Code that stops after the first addition
+// gets a digit that is far too large, and counts it down by ones.
+TEST(MpiModMpi, EndsAtOnceIfTheRemainderEqualsTheDivisor) {
   const Number A({0x12345678, 0x0000abcd, 0x48000000});
   const Number B({0xfedcba98, 0x8000ffff});
   Number R;

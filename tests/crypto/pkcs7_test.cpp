@@ -1,4 +1,4 @@
-// From the start of the block to the signer's public key.
+// Tests processCert from the start of the block to the signer's public key.
 #include "crypto/pkcs7.h"
 
 #include <gtest/gtest.h>
@@ -83,8 +83,8 @@ TEST(ProcessCertHeader, UnreadableContentTypeGivesThePlainLine) {
 }
 
 TEST(ProcessCertHeader, UnreadableLaterHeadersGiveTheirTagAndTheDistanceToNull) {
-  // The elements before, and then one octet that starts the [0] of the content, the SignedData, its
-  // version, digestAlgorithms, contentInfo or certificates.
+  // Each block ends after the first octet of one element. The elements are, in this order: the [0]
+  // of the content, the SignedData, its version, digestAlgorithms, contentInfo, certificates.
   const std::pair<const char*, int32_t> cases[] = {
       {"30 04 06 01 2a a0", 0},
       {"30 06 06 01 2a a0 01 30", 16},
@@ -113,7 +113,8 @@ TEST(ProcessCertHeader, TagIsPrintedAsASignedNumber) {
 }
 
 TEST(ProcessCertHeader, HeaderThatWouldStartAtOrBeyondTheEndHasTagZero) {
-  // The contentType ends with the block, then two bytes beyond it.
+  // In the first case, the contentType ends at the end of the block. In the second, it ends two
+  // bytes later.
   for (const char* digits : {"30 03 06 01 2a", "30 03 06 03 2a"}) {
     const ProcessedBlock processed(FromHex(digits));
     EXPECT_EQ(processed.result, 1);
@@ -122,8 +123,8 @@ TEST(ProcessCertHeader, HeaderThatWouldStartAtOrBeyondTheEndHasTagZero) {
 }
 
 TEST(ProcessCertHeader, LengthsAreComparedWithTheWholeBlockFromEachPosition) {
-  // One element before the certificates, the SignedData, may end beyond the block. Its length may
-  // be the block's, less its own header, at most.
+  // The SignedData may end beyond the block. Its length may be at most the block's length minus the
+  // 4 bytes of its own header.
   Bytes bytes = WithRsaKey(Bytes(64, 0x77), {3}).Build(kSignatureFile);
   const size_t signed_data = Find(bytes, FromHex("02 01 01 31")) - 4;
   ASSERT_EQ(bytes[signed_data + 1], 0x82);
@@ -194,7 +195,8 @@ TEST(ProcessCertKey, EcPointWhoseSecondByteIsAWrongLengthGivesTheUnreadableLine)
 }
 
 TEST(ProcessCertKey, UnreadableKeyGivesTheUnreadableLine) {
-  // No bytes, a SEQUENCE that ends beyond the key, one without a modulus, one with half of one.
+  // No bytes; half a header; a SEQUENCE that ends beyond the key; an empty SEQUENCE. Then half a
+  // header of the modulus, and a modulus without its contents.
   for (const char* digits : {"", "30", "30 05 02 01 03", "30 00", "30 01 02", "30 02 02 05"}) {
     const ProcessedBlock processed(WithPublicKey(FromHex(digits)));
     EXPECT_EQ(processed.result, 1);
@@ -202,8 +204,7 @@ TEST(ProcessCertKey, UnreadableKeyGivesTheUnreadableLine) {
   }
 }
 
-// The missing part of the key follows its BIT STRING, in a tbsCertificate whose other fields are
-// not read.
+// The rest of the key follows its BIT STRING, in a part of the tbsCertificate that is not read.
 TEST(ProcessCertKey, KeyEndsWithItsBitString) {
   const Bytes key = der::Sequence({der::Integer(Bytes(64, 0x77)), der::Integer(3)});
   for (size_t length = 0; length <= key.size(); ++length) {
@@ -235,7 +236,7 @@ TEST(ProcessCertKey, ModulusEndsWithTheSequence) {
 }
 
 TEST(ProcessCertKey, ClassesAreNotLookedAt) {
-  // A [16] of a [2] and a [2].
+  // The key is a [16] that contains two [2], in place of a SEQUENCE that contains two INTEGERs.
   const Bytes modulus(64, 0x77);
   const ProcessedBlock processed(WithPublicKey(der::Context(
       16, Concat({der::ContextPrimitive(2, modulus), der::ContextPrimitive(2, {3})}))));
@@ -270,7 +271,8 @@ TEST(ProcessCertKey, ModulusLosesExactlyOneZero) {
   EXPECT_EQ(Field(processed.record.modulus, processed.record.modulus_length), rest);
 }
 
-// An empty modulus that a zero follows, a modulus of one zero, and one of two.
+// In the first case, the modulus is empty and a zero byte follows it. In the second it is one zero
+// byte, in the third two.
 TEST(ProcessCertKey, EmptyModulusLeavesNoRoomForTheExponent) {
   const std::pair<const char*, uint32_t> cases[] = {
       {"30 03 02 00 00", 0}, {"30 06 02 01 00 02 01 03", 0}, {"30 07 02 02 00 00 02 01 03", 1}};
@@ -291,7 +293,7 @@ TEST(ProcessCertKey, ExponentIsComparedWithTheLengthOfTheModulus) {
   EXPECT_EQ(processed.record.modulus_length, 4u);
 }
 
-// The record leaves out the leading zero, but the zero counts: five bytes.
+// The record leaves out the leading zero of the modulus, but the comparison counts it: five bytes.
 TEST(ProcessCertKey, ExponentIsComparedWithTheLengthOfTheModulusAsWritten) {
   const ProcessedBlock processed(WithRsaKey(Concat({{0x00}, Bytes(4, 0x77)}), {1, 0, 1}));
   EXPECT_EQ(processed.result, 0);
@@ -299,7 +301,7 @@ TEST(ProcessCertKey, ExponentIsComparedWithTheLengthOfTheModulusAsWritten) {
   EXPECT_EQ(ProcessedBlock(WithRsaKey(Concat({{0x00}, Bytes(3, 0x77)}), {1, 0, 1})).result, 1);
 }
 
-TEST(ProcessCertKey, ExponentMayStandBehindTheKey) {
+TEST(ProcessCertKey, ExponentMayFollowTheKey) {
   const ProcessedBlock processed(
       WithPublicKey(Concat({der::Sequence({der::Integer(Bytes(64, 0x77))}), der::Integer(3)})));
   EXPECT_EQ(processed.result, 0);
@@ -314,9 +316,9 @@ TEST(ProcessCertKey, ExponentThatIsNotAnIntegerGivesTheIntegerLine) {
   EXPECT_EQ(processed.record.modulus_length, 64u);
 }
 
-TEST(ProcessCertKey, ExponentMustLieInTheBlock) {
-  // The exponent's header ends the key. Its length covers the rest of the block and fits the
-  // modulus.
+TEST(ProcessCertKey, ExponentMustBeInTheBlock) {
+  // The key ends after the exponent's header. The length in this header covers the rest of the
+  // block, and is not greater than the modulus's.
   SignatureBlock block =
       WithPublicKey(Concat({der::Sequence({der::Integer(Bytes(200, 0x77))}), {0x02, 0x81, 0x00}}));
   block.signer_infos = Bytes();

@@ -1,4 +1,4 @@
-// Why a library of a real package is not signed, in the words of the simulator.
+// Tests the simulator's texts for libraries of real packages that are not signed.
 #include "journeys/reason.h"
 
 #include "support/package.h"
@@ -20,7 +20,7 @@ TEST_F(Reason, TamperedLibrary) {
                    "  ✓ key                    registered for com.example.vault", "-> 1"}));
 }
 
-TEST_F(Reason, EncryptedLibraryOfALonelyPackage) {
+TEST_F(Reason, EncryptedLibraryIsNotLaidOut) {
   Take("apksigner-sha256-2048");
   Do("rm -r lib; unzip -q base.apk 'lib/*'; zip -q -P word base.apk lib/arm64-v8a/*; rm -r lib");
   EXPECT_EQ(Told(4, {"--install"}),
@@ -38,7 +38,8 @@ TEST_F(Reason, LibraryInASubdirectoryOfItsAbi) {
             "tool looks for lib/arm64/sub/libx.so, and installers do not put it there");
 }
 
-// Phones install the libraries of one processor, and so they are no refusal.
+// Phones install the libraries of one processor. Libraries of another processor do not count as
+// refused.
 TEST_F(Reason, LibrariesOfAnotherProcessorAreNotLaidOut) {
   Take("apksigner-sha256-2048");
   Do("rm -r lib");
@@ -56,7 +57,7 @@ TEST_F(Reason, LibrariesOfAnotherProcessorAreNotLaidOut) {
   EXPECT_EQ(Told(4, {"--install=all", "--strict"}).back(), "-> 0");
 }
 
-// A library that was asked for and is missing stays a refusal.
+// With --strict, a library that no installer puts beside the package still counts as refused.
 TEST_F(Reason, StrictRefusesALibraryThatNoInstallerTakes) {
   MakePackage(WithLibraries({{"lib/arm64-v8a/libx.so", ToBytes("x")},
                              {"lib/arm64-v8a/sub/liby.so", ToBytes("y")}}))
@@ -66,7 +67,7 @@ TEST_F(Reason, StrictRefusesALibraryThatNoInstallerTakes) {
 }
 
 // The package alone, as a store delivers it.
-TEST_F(Reason, LibrariesThatDoNotLieBesideThePackage) {
+TEST_F(Reason, LibrariesThatAreNotBesideThePackage) {
   Take("apksigner-sha256-2048");
   Do("rm -r lib");
   const std::string absent =
@@ -86,8 +87,8 @@ TEST_F(Reason, LibrariesThatDoNotLieBesideThePackage) {
   EXPECT_EQ(Told(4, {"--install"})[2], "  ✓ lib/arm64/libvault.so  signed");
 }
 
-// A store's package is looked at as phones have it, and nobody has to ask for that.
-TEST_F(Reason, PackageThatLiesAloneIsLaidOut) {
+// Without an --install option, the libraries of a package that is alone are laid out as on a phone.
+TEST_F(Reason, PackageWithoutLibrariesBesideItIsLaidOut) {
   Take("apksigner-sha256-2048");
   Do("rm -r lib");
   const auto run = [this] {
@@ -98,7 +99,7 @@ TEST_F(Reason, PackageThatLiesAloneIsLaidOut) {
   EXPECT_EQ(alone.status, 0);
   EXPECT_NE(alone.output.find("  ✓ lib/arm64/libvault.so  signed\n"), std::string::npos);
   EXPECT_NE(alone.output.find(std::string("\n") + kLaidOut + "\n"), std::string::npos);
-  // One of the installer's directories is there, and so it was installed.
+  // If lib/arm64 or lib/arm exists, the package counts as installed, and nothing is laid out.
   for (const std::string place : {"lib/arm64", "lib/arm"}) {
     Do("rm -rf lib; mkdir -p " + place);
     const ProcessResult installed = run();
@@ -107,7 +108,7 @@ TEST_F(Reason, PackageThatLiesAloneIsLaidOut) {
         << installed.output;
     EXPECT_EQ(installed.output.find("laid out"), std::string::npos);
   }
-  // Another directory of that name is nobody's.
+  // A directory lib without lib/arm64 and lib/arm does not count.
   Do("rm -rf lib; mkdir lib");
   EXPECT_EQ(run().output, alone.output);
 }

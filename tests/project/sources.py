@@ -1,8 +1,8 @@
-"""What the tests of this directory share: how they read the project's own files, and how they end.
+"""Functions that the tests of this directory share: they read the project's own files and report the
+result.
 
-Tables that must agree with the sources are written by these tests: started with --write before its
-other arguments, a test brings its tables up to date instead of comparing them. A test that fails
-prints the command, or the file, that fixes it.
+These tests compare tables in the docs with the sources. With --write as its first argument, a test
+writes its tables anew instead. A test that fails prints the command to run or the file to fix.
 """
 
 import difflib
@@ -35,8 +35,8 @@ def without_comments(text):
 
 
 class Shell:
-    """A shell in the directory, in which these words start apktoolkit-sim. A command finds the files and the
-    status that the one before it left."""
+    """Runs shell commands in `directory`. The name apktoolkit-sim starts the command line `simulator`, a
+    list of words. Each command sees the files and the exit status of the command before it."""
 
     def __init__(self, directory, simulator):
         self.directory, self.status = directory, 0
@@ -54,7 +54,7 @@ class Shell:
 
 
 def changed_zip(archive, change, out):
-    """A copy of the zip archive, with what change(name, content) makes of each entry."""
+    """Writes a copy of the zip archive to `out`. Each entry's content is replaced by change(name, content)."""
     with zipfile.ZipFile(archive) as source, zipfile.ZipFile(out, "w") as copy:
         for name in source.namelist():
             copy.writestr(name, change(name, source.read(name)))
@@ -68,10 +68,10 @@ def shown_commands(block):
 
 
 def report(problems, fix="", pages=None):
-    """Prints the problems and how each is fixed; the exit status of the test.
+    """Prints the problems and how to fix them. Returns the exit status of the test.
 
-    `fix`: the file or the command that fixes the problems. `pages`: by its path, the text that each
-    page with generated parts must have.
+    `fix`: the file or the command that fixes the problems. `pages`: a map from the path of each page
+    with generated parts to its right text.
     """
     problems, stale = list(problems), {path: right for path, right in (pages or {}).items() if path.read_text() != right}
     for path, right in stale.items():

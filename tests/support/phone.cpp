@@ -66,7 +66,7 @@ int __real_usleep(useconds_t microseconds);
 ssize_t __real_fgetxattr(int fd, const char* name, void* value, size_t size);
 ssize_t __real_readlink(const char* path, char* buffer, size_t size);
 
-// Test programs with a Phone make no files by open(), so no mode is passed on.
+// Test programs with a Phone create no files with open(), so the mode is not needed.
 int __wrap_open(const char* path, int flags, ...) {
   if (phone == nullptr) return __real_open(path, flags);
   if (phone->before_open) phone->before_open(path, flags);
@@ -90,7 +90,8 @@ ssize_t __wrap___read_chk(int fd, void* buffer, size_t size, size_t /*room*/) {
   return __wrap_read(fd, buffer, size);
 }
 
-// The name of open in a build with _FORTIFY_SOURCE, as in every platform tree.
+// Calls of open become calls of __open_2 in a build with _FORTIFY_SOURCE. Every platform tree is
+// built so.
 int __wrap___open_2(const char* path, int flags) { return __wrap_open(path, flags); }
 
 FILE* __wrap_fopen(const char* path, const char* mode) {

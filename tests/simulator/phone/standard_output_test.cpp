@@ -10,7 +10,7 @@ Json Printed(const std::string& text) { return {{"event", "stdout"}, {"text", te
 
 }  // namespace
 
-TEST(StandardOutput, LinesStandWhereTheyWerePrinted) {
+TEST(StandardOutput, LinesAreInTheOrderOfPrinting) {
   const ProbeRun run =
       Probe({"puts one", "log 4 tag 61", "print 74776f0a", "verify 3", "puts three"}).Run();
   ASSERT_EQ(run.events.size(), 6U);
@@ -25,7 +25,7 @@ TEST(StandardOutput, PiecesOfALineAreOneEvent) {
   const ProbeRun run = Probe({"print 61", "print 620a", "print 63"}).Run();
   ASSERT_EQ(run.events.size(), 3U);
   EXPECT_EQ(run.events[0], Printed("ab\n"));
-  EXPECT_EQ(run.events[1], Printed("c"));  // when the process ends
+  EXPECT_EQ(run.events[1], Printed("c"));  // recorded when the process ends
 }
 
 TEST(StandardOutput, TextsAreBytes) {
