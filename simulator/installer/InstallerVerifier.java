@@ -98,6 +98,14 @@ public final class InstallerVerifier {
             starts.addAll(NEW_RULES);
             ranges = verifyEach(source, first, last, starts, hasNewer);
         }
+        // The lineage must lead from the signers of earlier phones to those of later phones. The
+        // verifier checks that only for all levels together.
+        if (!isRefused && hasNewer) {
+            Range whole = verify(source, first, last, hasNewer);
+            if (!whole.isVerified) {
+                ranges = List.of(whole);
+            }
+        }
         List<String> told = new ArrayList<>();
         for (Range range : ranges) {
             told.add(range.json());

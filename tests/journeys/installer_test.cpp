@@ -2,6 +2,9 @@
 // person reads about them.
 #include <gtest/gtest.h>
 
+#include <sys/stat.h>
+
+#include <filesystem>
 #include <nlohmann/json.hpp>
 #include <sstream>
 
@@ -194,6 +197,17 @@ TEST(Installer, SignerForLaterPhonesAloneIsFound) {
 }
 
 // Older versions of apksig do not know v3.1, and would name the first key for all phones.
+// Phones of API 27 and later phones each take a signature that verifies. apksigner says why the
+// package is refused all the same: an update would change the signer without a lineage.
+TEST(Installer, RefusesAV3SignerWithoutALineageFromTheV2Signer) {
+  const Lines told = Told("foreign-v3");
+  EXPECT_EQ(told.front(), "NOT INSTALLABLE");
+  EXPECT_NE(told[1].find("(V3_SIG_PAST_SIGNERS_MISMATCH)"), std::string::npos) << told[1];
+  EXPECT_EQ(told.back(), "-> 1");
+  EXPECT_EQ(Told("foreign-v3", {"--api", "27"}),
+            Lines({"SIGNED", "phones of API 27 install it, verified by v2", "-> 0"}));
+}
+
 TEST(Installer, SignerOfASchemeThatTheVerifierDoesNotKnowIsNotPassedOver) {
   const ProcessResult run = RunProcess(
       {SimulatorPath(), "--quiet", "--installer=required", Golden("later-v31") + "/base.apk"});
