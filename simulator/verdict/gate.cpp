@@ -2,6 +2,7 @@
 
 #include <algorithm>
 #include <set>
+#include <tuple>
 
 #include "simulator/verdict/parts.h"
 #include "simulator/verdict/wording.h"
@@ -10,14 +11,17 @@ namespace simulator {
 
 namespace {
 
+using Signers = std::vector<CertificateFacts>;
+
 void Refuse(ItemKind kind, const char* name, const Reason& reason, Report* report);
 CertificateFacts JarSigner(const Report& report);
 std::vector<const CertificateFacts*> NewestSigners(const RangeJudgement& range);
-std::vector<CertificateFacts> InstalledSigners(const Report& report);
+Signers InstalledSigners(const Report& report);
 bool IsJudged(const Report& report);
 bool HasForgeableKey(const Report& report);
 bool IsOneOf(const std::vector<std::string>& digests, const CertificateFacts& signer);
 bool AreSameSigner(const CertificateFacts& one, const CertificateFacts& other);
+std::string SignersText(const Signers& signers);
 std::string DigestsText(const CertificateFacts& signer);
 
 }  // namespace
@@ -92,18 +96,18 @@ void Gate::DemandOneSigner(Report* report) {
   const auto& [place, is_first] = first_.emplace(report->package_name, own);
   if (is_first) return;
   const First& first = place->second;
-  const auto refuse = [&](const CertificateFacts& one, const CertificateFacts& other) {
+  const auto refuse = [&](const Signers& one, const Signers& other) {
     Refuse(
         ItemKind::kSigner, "signer",
         {&cause::kSignerDiffers, first.file + " of " + report->package_name + " is by " +
-                                     DigestsText(one) + ", and this one by " + DigestsText(other)},
+                                     SignersText(one) + ", and this one by " + SignersText(other)},
         report);
   };
-  if (!AreSameSigner(first.jar, own.jar)) return refuse(first.jar, own.jar);
+  if (!AreSameSigner(first.jar, own.jar)) return refuse({first.jar}, {own.jar});
   if (first.installed.empty() || own.installed.empty()) return;
   const bool are_same = std::equal(first.installed.begin(), first.installed.end(),
                                    own.installed.begin(), own.installed.end(), AreSameSigner);
-  if (!are_same) refuse(first.installed[0], own.installed[0]);
+  if (!are_same) refuse(first.installed, own.installed);
 }
 
 void Gate::DemandNoWarnings(bool is_other_signers, Report* report) {
@@ -146,21 +150,27 @@ std::vector<const CertificateFacts*> NewestSigners(const RangeJudgement& range) 
   return signers;
 }
 
-// The signers for whom phones install the package: those of the newest phones that install it.
-// Where the installer was not asked, those of the newest scheme that the file names.
-std::vector<CertificateFacts> InstalledSigners(const Report& report) {
-  std::vector<CertificateFacts> signers;
+// The signers by whom any of the phones knows the package, each once, in a fixed order. If the
+// installer was not asked: those of the newest scheme that the file names.
+Signers InstalledSigners(const Report& report) {
+  Signers signers;
   for (const RangeJudgement& range : report.installer.ranges) {
-    if (!range.is_verified) continue;
-    signers.clear();
     for (const CertificateFacts* const signer : NewestSigners(range)) signers.push_back(*signer);
   }
-  if (IsJudged(report)) return signers;
-  std::string newest;
-  for (const NewerSignerFacts& signer : report.newer) newest = std::max(newest, signer.scheme);
-  for (const NewerSignerFacts& signer : report.newer) {
-    if (signer.scheme == newest) signers.push_back(signer.certificate);
+  if (!IsJudged(report)) {
+    std::string newest;
+    for (const NewerSignerFacts& signer : report.newer) newest = std::max(newest, signer.scheme);
+    for (const NewerSignerFacts& signer : report.newer) {
+      if (signer.scheme == newest) signers.push_back(signer.certificate);
+    }
+    if (newest.empty()) signers.push_back(JarSigner(report));
   }
+  const auto comes_before = [](const CertificateFacts& one, const CertificateFacts& other) {
+    return std::tie(one.sha256, one.key.modulus_sha256) <
+           std::tie(other.sha256, other.key.modulus_sha256);
+  };
+  std::sort(signers.begin(), signers.end(), comes_before);
+  signers.erase(std::unique(signers.begin(), signers.end(), AreSameSigner), signers.end());
   return signers;
 }
 
@@ -182,6 +192,14 @@ bool IsOneOf(const std::vector<std::string>& digests, const CertificateFacts& si
 // The kernel knows a signer by the key, and phones know a signer by the certificate.
 bool AreSameSigner(const CertificateFacts& one, const CertificateFacts& other) {
   return one.sha256 == other.sha256 && one.key.modulus_sha256 == other.key.modulus_sha256;
+}
+
+std::string SignersText(const Signers& signers) {
+  std::string text;
+  for (const CertificateFacts& signer : signers) {
+    text += (text.empty() ? "" : " and ") + DigestsText(signer);
+  }
+  return text;
 }
 
 std::string DigestsText(const CertificateFacts& signer) {

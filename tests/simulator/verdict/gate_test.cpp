@@ -371,14 +371,46 @@ TEST(GateOfOnePackage, AnotherCertificateOrKeyIsAnotherSigner) {
   EXPECT_EQ(AfterOthers({SignedBy(kOwner), report}), Lines({"signer-differs"}));
 }
 
-TEST(GateOfOnePackage, SignersOfTheNewestSchemeAreComparedWhereBothWereJudged) {
+TEST(GateOfOnePackage, SignersOfAllPhonesAreCompared) {
   const Report by_owner = InstalledFor(SignedBy(kOwner), {Takes(27, {{"v2", kOwner}})});
   const Report by_other = InstalledFor(
       SignedBy(kOwner), {Takes(27, {{"v2", kOwner}}), Takes(28, {{"v2", kOwner}, {"v3", kOther}})});
+  const Report by_other_before = InstalledFor(
+      SignedBy(kOwner), {Takes(27, {{"v2", kOther}}), Takes(28, {{"v2", kOther}, {"v3", kOwner}})});
   EXPECT_EQ(AfterOthers({by_owner, by_owner}), Lines());
   EXPECT_EQ(AfterOthers({by_owner, by_other}), Lines({"signer-differs"}));
-  EXPECT_EQ(AfterOthers({SignedBy(kOwner), by_other}), Lines());
-  EXPECT_EQ(AfterOthers({by_other, SignedBy(kOwner)}), Lines());
+  EXPECT_EQ(AfterOthers({by_owner, by_other_before}), Lines({"signer-differs"}));
+}
+
+TEST(GateOfOnePackage, SignersAreComparedInAnyOrder) {
+  const auto installed_for = [](const std::vector<InstallerSigner>& signers) {
+    return InstalledFor(SignedBy(kOwner), {Takes(27, signers)});
+  };
+  const Report two = installed_for({{"v2", kOwner}, {"v2", kOther}});
+  EXPECT_EQ(AfterOthers({two, installed_for({{"v2", kOther}, {"v2", kOwner}})}), Lines());
+  const GateOptions options;
+  Gate gate(options);
+  Report one = installed_for({{"v2", kOwner}}), last = two;
+  gate.Judge(&one);
+  gate.Judge(&last);
+  const std::string text = last.items[1].reason.Text();
+  EXPECT_EQ(text.substr(text.find(", and this one by")),
+            ", and this one by CN=a (SHA-256 digest of the certificate " + kOwner.sha256 +
+                ", of the public key " + kOwner.key.sha256 + ", of the modulus " +
+                kOwner.key.modulus_sha256 + ") and CN=b (SHA-256 digest of the certificate " +
+                kOther.sha256 + ", of the public key " + kOther.key.sha256 + ", of the modulus " +
+                kOther.key.modulus_sha256 + ")");
+}
+
+// Where no installer is asked, a file counts as signed by those that it names.
+TEST(GateOfOnePackage, WithoutAnInstallerTheNewestSchemesThatFilesNameAreCompared) {
+  Report by_owner = SignedBy(kOwner), by_other = SignedBy(kOwner);
+  by_owner.newer = {{"v2", kOther}, {"v3", kOwner}};
+  by_other.newer = {{"v2", kOwner}, {"v3", kOther}};
+  EXPECT_EQ(AfterOthers({SignedBy(kOwner), by_owner}), Lines());
+  EXPECT_EQ(AfterOthers({SignedBy(kOwner), by_other}), Lines({"signer-differs"}));
+  EXPECT_EQ(AfterOthers({by_other, SignedBy(kOwner)}), Lines({"signer-differs"}));
+  EXPECT_EQ(AfterOthers({by_owner, by_other}), Lines({"signer-differs"}));
 }
 
 TEST(GateOfOnePackage, OthersAreNotCompared) {
