@@ -55,6 +55,7 @@ void AddGate(CLI::App* app, Options* options);
 void AddOutput(CLI::App* app, Options* options);
 void AddRun(CLI::App* app, Options* options, std::string* runner);
 void AddVerify(CLI::App* app, Options* options);
+std::string WhyNoName(const std::string& name);
 bool ReadLevels(const std::string& text, LevelRange* levels);
 int ErrorNumber(const std::string& name);
 std::optional<int> NameUnknownOption(const CLI::App& app);
@@ -152,7 +153,8 @@ void AddPhone(CLI::App* app, Options* options) {
   app->add_option("--state", options->run.state,
                   "Remember signed files in DIR, and trust them\n"
                   "while their bytes stay the same")
-      ->type_name("DIR");
+      ->type_name("DIR")
+      ->check(WhyNoName);
 }
 
 void AddKernelAnswer(CLI::App* app, const char* name, int* error, const char* description) {
@@ -168,14 +170,11 @@ void AddFiles(CLI::App* app, Options* options) {
   app->add_flag("--recursive", files->is_recursive,
                 "Take the packages in and below a directory:\n"
                 ".apk .jar .apks .xapk .apkm .aab");
-  const auto is_name = [](const std::string& name) {
-    return name.empty() ? "the name is empty" : std::string();
-  };
   CLI::Option* const list = app->add_option("--files-from", files->list,
                                             "Read more FILEs from a list, one a line;\n"
                                             "\"-\" is standard input")
                                 ->type_name("LIST")
-                                ->check(is_name);
+                                ->check(WhyNoName);
   app->add_flag("-0,--null", files->has_nul, "The names of the list end with NUL bytes")
       ->needs(list);
 }
@@ -278,15 +277,18 @@ void AddOutput(CLI::App* app, Options* options) {
         "and the chain from key to entries");
   app->add_flag("--json", options->show.json, "Print the journal, one JSON object a line");
   app->add_option("--journal", options->show.journal, "Write the journal to FILE; - is like --json")
-      ->type_name("FILE");
+      ->type_name("FILE")
+      ->check(WhyNoName);
   // Standard output has the verdicts, which would make any of these documents malformed.
   const auto is_no_stream = [](const std::string& path) {
-    return path == "-" ? "it is not written to standard output (a file of that name: ./-)" : "";
+    return std::string(
+        path == "-" ? "it is not written to standard output (a file of that name: ./-)" : "");
   };
   const auto document = [&](const char* name, std::string* path, const char* description) {
     app->add_option(name, *path, description)
         ->type_name("FILE")
-        ->check(CLI::Validator(is_no_stream, ""));
+        ->check(WhyNoName)
+        ->check(is_no_stream);
   };
   document("--junit", &options->show.junit, "Write test results to FILE, in JUnit format");
   document("--sarif", &options->show.sarif, "Write results to FILE, as a SARIF 2.1.0 log");
@@ -345,6 +347,11 @@ std::optional<int> NameUnknownOption(const CLI::App& app) {
 int MissFile() {
   std::cerr << "FILE is required, or --files-from\nRun with --help for more information.\n";
   return kUsageError;
+}
+
+// A script whose variable is not set gives an empty name.
+std::string WhyNoName(const std::string& name) {
+  return name.empty() ? "the name is empty" : std::string();
 }
 
 // Reads LEVEL, LEVEL-LEVEL or LEVEL-. The last form has no upper end.
