@@ -38,7 +38,7 @@ int main(int argc, char** argv) {
   if (options.installer.use == InstallerUse::kRequired) {
     if (const auto missing = installer.Missing()) return presenter.GiveUp(names, *missing);
   }
-  if (!presenter.Begin()) return kCannotSimulate;
+  if (const auto problem = presenter.Begin()) return presenter.GiveUp(names, *problem);
   if (list.others > 0) {
     const std::string others = Counted(list.others, "file", "files");
     Complain(kAllSigned,

@@ -22,6 +22,10 @@ bool BeginsWith(const std::string& path, std::string_view start) {
   return file && found == start;
 }
 
+bool AreSame(const struct stat& one, const struct stat& other) {
+  return one.st_dev == other.st_dev && one.st_ino == other.st_ino;
+}
+
 // The file that a path leads to. Its last part need not exist, and may be a link to a file that
 // opening it would make.
 fs::path Resolved(const std::string& path) {
@@ -41,10 +45,15 @@ std::optional<std::string> OutputFile::Objection(const std::vector<std::string>&
   const std::string named = std::string(kind_.option) + " " + path_;
   struct stat state = {};
   if (stat(path_.c_str(), &state) != 0 || !S_ISREG(state.st_mode)) return {};
+  for (const int stream : {STDOUT_FILENO, STDERR_FILENO}) {
+    struct stat other = {};
+    if (fstat(stream, &other) == 0 && AreSame(state, other)) {
+      return named + " is also standard output or standard error; two outputs cannot be one file";
+    }
+  }
   for (const std::string& input : inputs) {
     struct stat other = {};
-    if (stat(input.c_str(), &other) == 0 && other.st_dev == state.st_dev &&
-        other.st_ino == state.st_ino) {
+    if (stat(input.c_str(), &other) == 0 && AreSame(state, other)) {
       return named + " is a file that is to be looked at; it is left alone";
     }
   }

@@ -25,8 +25,8 @@ class OutputFile {
   bool IsWanted() const { return !path_.empty(); }
   const char* option() const { return kind_.option; }
 
-  // Returns a reason not to write the file: it has other contents, or is one of `inputs`. Else
-  // none.
+  // Returns a reason not to write the file: it has other contents, is one of `inputs`, or is the
+  // file that standard output or standard error goes to. Else none.
   std::optional<std::string> Objection(const std::vector<std::string>& inputs) const;
   // True if this file and `other` are the same file, even under two names. False for devices and
   // pipes.
@@ -34,6 +34,8 @@ class OutputFile {
 
   // Opens and empties the file. Returns false, with errno set, if it cannot be written.
   bool Open();
+  bool IsOpen() const { return file_ && file_->get() >= 0; }
+  void Close() { file_.reset(); }
   // Appends `text`. Returns false, with errno set, if it cannot be written.
   bool Append(std::string_view text) const;
   // The message for the user after a failure.

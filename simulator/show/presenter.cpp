@@ -3,6 +3,7 @@
 #include <unistd.h>
 
 #include <algorithm>
+#include <array>
 #include <ctime>
 #include <iostream>
 
@@ -22,6 +23,16 @@ constexpr OutputKind kJunit = {"--junit", "JUnit report", kJunitStart};
 constexpr OutputKind kSarif = {"--sarif", "SARIF log", kSarifStart};
 constexpr char kEraseLine[] = "\r\x1b[K";
 
+std::string JournalStart() { return Event("journal").Number("version", kJournalVersion).Line(); }
+
+// The report of a file that nothing looked at.
+Report Untold(const std::string& file, const Reason& why) {
+  Report report;
+  report.file = file;
+  report.items = {NotDone(ItemKind::kTool, "tool", why, {})};
+  return report;
+}
+
 }  // namespace
 
 Presenter::Presenter(const ShowOptions& options, size_t file_count)
@@ -36,9 +47,10 @@ Presenter::Presenter(const ShowOptions& options, size_t file_count)
       sarif_file_(kSarif, options.sarif) {}
 
 std::optional<std::string> Presenter::Objection(const std::vector<std::string>& inputs) const {
-  const OutputFile* const files[] = {&journal_, &page_file_, &junit_file_, &sarif_file_};
-  for (const OutputFile* const* file = std::begin(files); file != std::end(files); ++file) {
-    for (const OutputFile* const* other = file + 1; other != std::end(files); ++other) {
+  const std::array<const OutputFile*, 4> files = {&journal_, &page_file_, &junit_file_,
+                                                  &sarif_file_};
+  for (auto file = files.begin(); file != files.end(); ++file) {
+    for (auto other = file + 1; other != files.end(); ++other) {
       if (!(*file)->IsSameAs(**other)) continue;
       return std::string((*file)->option()) + " and " + (*other)->option() + " name the same file";
     }
@@ -47,16 +59,12 @@ std::optional<std::string> Presenter::Objection(const std::vector<std::string>& 
   return {};
 }
 
-bool Presenter::Begin() {
-  if (!journal_.Open()) {
-    FailToWrite(journal_);
-  } else {
-    Keep(Event("journal").Number("version", kJournalVersion).Line());
+std::optional<std::string> Presenter::Begin() {
+  for (OutputFile* const file : AllFiles()) {
+    if (!file->Open()) return file->ErrorText();
   }
-  for (OutputFile* const file : {&page_file_, &junit_file_, &sarif_file_}) {
-    if (!file->Open()) FailToWrite(*file);
-  }
-  return status_ == kAllSigned;
+  Keep(JournalStart());
+  return {};
 }
 
 void Presenter::Show(const Report& report, const std::string& journal) {
@@ -117,9 +125,12 @@ int Presenter::Finish(const std::vector<std::string>& files) {
       !verdicts_.empty()) {
     std::cout << '\n' << Summary(verdicts_, Unseen()) << '\n';
   }
-  if (page_file_.IsWanted() && !page_file_.Append(page_.Html(Unseen()))) FailToWrite(page_file_);
-  ReportUntold({files.begin() + static_cast<std::ptrdiff_t>(shown_), files.end()},
-               {&cause::kInterrupted, ""});
+  Write(&page_file_, page_.Html(Unseen()));
+  for (size_t i = shown_; i < files.size(); ++i) {
+    const Report report = Untold(files[i], {&cause::kInterrupted, ""});
+    junit_.Add(report);
+    sarif_.Add(report);
+  }
   WriteReports();
   if (!missing_.empty()) Complain(status_, missing_);
   return EndWith(status_);
@@ -132,39 +143,49 @@ std::optional<size_t> Presenter::Unseen() const {
   return unseen;
 }
 
+// No output of an earlier run stays, or it would be taken for this one's.
 int Presenter::GiveUp(const std::vector<std::string>& files, const std::string& problem) {
   status_ = Complain(kCannotSimulate, problem);
-  for (OutputFile* const file : {&junit_file_, &sarif_file_}) {
-    if (!file->Open()) FailToWrite(*file);
+  for (OutputFile* const file : AllFiles()) {
+    if (!file->Open() && file->ErrorText() != problem) FailToWrite(file);
   }
-  ReportUntold(files, {&cause::kNotBegun, problem});
+  Write(&journal_, JournalStart());
+  for (const std::string& file : files) {
+    const Report report = Untold(file, {&cause::kNotBegun, problem});
+    page_.Add(report);
+    junit_.Add(report);
+    sarif_.Add(report);
+  }
+  Write(&page_file_, page_.Html());
   WriteReports();
   return status_;
 }
 
-void Presenter::ReportUntold(const std::vector<std::string>& files, const Reason& why) {
-  for (const std::string& file : files) {
-    Report report;
-    report.file = file;
-    report.items = {NotDone(ItemKind::kTool, "tool", why, {})};
-    junit_.Add(report);
-    sarif_.Add(report);
-  }
+void Presenter::WriteReports() {
+  Write(&junit_file_, junit_.Xml());
+  Write(&sarif_file_, sarif_.Log());
 }
 
-void Presenter::WriteReports() {
-  if (junit_file_.IsWanted() && !junit_file_.Append(junit_.Xml())) FailToWrite(junit_file_);
-  if (sarif_file_.IsWanted() && !sarif_file_.Append(sarif_.Log())) FailToWrite(sarif_file_);
+// An output that has failed gets nothing more, and no second message.
+void Presenter::Write(OutputFile* file, std::string_view text) {
+  if (file->IsOpen() && !file->Append(text)) FailToWrite(file);
 }
 
 // The journal goes to its file, and to standard output when that is asked for.
 void Presenter::Keep(const std::string& journal) {
   if (options_.json) std::cout << journal;
-  if (!journal_.Append(journal)) FailToWrite(journal_);
+  Write(&journal_, journal);
 }
 
-void Presenter::FailToWrite(const OutputFile& file) {
-  status_ = std::max(status_, Complain(kCannotSimulate, file.ErrorText()));
+void Presenter::FailToWrite(OutputFile* file) {
+  const std::string problem = file->ErrorText();
+  status_ = std::max(status_, Complain(kCannotSimulate, problem));
+  sarif_.AddProblem(problem);
+  file->Close();
+}
+
+std::array<OutputFile*, 4> Presenter::AllFiles() {
+  return {&journal_, &page_file_, &junit_file_, &sarif_file_};
 }
 
 int Complain(int status, const std::string& message) {

@@ -2,8 +2,10 @@
 // page, and in reports for other programs.
 #pragma once
 
+#include <array>
 #include <optional>
 #include <string>
+#include <string_view>
 #include <vector>
 
 #include "simulator/run/run_record.h"
@@ -33,8 +35,8 @@ class Presenter {
   // Returns a reason not to begin if an output would overwrite a file of the user, or one of
   // `inputs`, or if two outputs have the same path. Else none.
   std::optional<std::string> Objection(const std::vector<std::string>& inputs) const;
-  // Opens the outputs. Returns false, after an error message, if one of them cannot be written.
-  bool Begin();
+  // Opens the outputs. Returns none, or why one of them cannot be written: then call GiveUp.
+  std::optional<std::string> Begin();
   // `journal` are the lines of the run, from "start" to "exit".
   void Show(const Report& report, const std::string& journal);
   // Shows the output of a run of apktoolkit-verify. `report` says why it could not be simulated.
@@ -44,16 +46,17 @@ class Presenter {
   // run was interrupted, those that were not shown are errors in the reports for other programs.
   // Returns the highest status of all files, or at least kCannotSimulate if an output failed.
   int Finish(const std::vector<std::string>& files);
-  // Called instead of all functions above if no file can be simulated because of `problem`. Returns
-  // the exit status.
+  // Called instead of Show and Finish if no file can be simulated because of `problem`. The page
+  // and the reports then have an error for each file. Returns the exit status.
   int GiveUp(const std::vector<std::string>& files, const std::string& problem);
 
  private:
   std::optional<size_t> Unseen() const;
   void Keep(const std::string& journal);
-  void ReportUntold(const std::vector<std::string>& files, const Reason& why);
   void WriteReports();
-  void FailToWrite(const OutputFile& file);
+  void Write(OutputFile* file, std::string_view text);
+  void FailToWrite(OutputFile* file);
+  std::array<OutputFile*, 4> AllFiles();
   void EraseProgress();
 
   const ShowOptions& options_;

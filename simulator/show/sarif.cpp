@@ -63,6 +63,11 @@ void Sarif::Add(const Report& report) {
       {{"level", kError}, {"message", Message(text)}, {"locations", Json::array({location})}});
 }
 
+void Sarif::AddProblem(const std::string& problem) {
+  is_successful_ = false;
+  notifications_.push_back({{"level", kError}, {"message", Message(problem)}});
+}
+
 std::string Sarif::Log() const {
   Json invocation = {{"executionSuccessful", is_successful_}};
   if (!notifications_.empty()) invocation["toolExecutionNotifications"] = notifications_;

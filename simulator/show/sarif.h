@@ -31,6 +31,9 @@ class Sarif {
   // The next file, in the order of the command line.
   void Add(const Report& report);
 
+  // A failure of the run itself, such as another output that cannot be written.
+  void AddProblem(const std::string& problem);
+
   // The whole log, in UTF-8.
   std::string Log() const;
 
@@ -48,7 +51,7 @@ class Sarif {
   Json artifacts_ = Json::array();
   Json results_ = Json::array();
   Json notifications_ = Json::array();
-  bool is_successful_ = true;          // each file was judged
+  bool is_successful_ = true;          // each file was judged, and nothing else failed
   bool is_installer_missing_ = false;  // said once for the whole run
 };
 

@@ -337,6 +337,57 @@ TEST(ExitStatus, TwoWhenTwoOutputsAreOneFile) {
   }
 }
 
+// Both would write over each other. A pipe is no file, and takes both in turn.
+TEST(ExitStatus, TwoWhenAnOutputIsAlsoStandardOutput) {
+  const Probe probe({"sign 3 0000"});
+  const auto told = [&probe](const std::string& rest) {
+    return RunProcess({"bash", "-c",
+                       "cd \"$1\"; \"$2\" --quiet --tool " PROBE_PATH " \"$3\" " + rest, "bash",
+                       probe.directory().path(), SimulatorPath(), probe.path()});
+  };
+  const ProcessResult same = told("--junit /dev/stdout >same");
+  EXPECT_EQ(same.status, 2);
+  EXPECT_EQ(same.errors,
+            "apktoolkit-sim: --junit /dev/stdout is also standard output or standard "
+            "error; two outputs cannot be one file\n");
+  EXPECT_EQ(told("--journal errors 2>errors").status, 2);
+  EXPECT_EQ(told("--journal /dev/stdout | cat").status, 0);
+}
+
+// One output cannot be opened: the others must not look like those of a good run.
+TEST(ExitStatus, ThreeInEachReportWhenOneOutputCannotBeOpened) {
+  const Probe probe({"sign 3 0000"});
+  const std::string directory = probe.directory().path();
+  const std::string junit = directory + "/j.xml", sarif = directory + "/s.sarif",
+                    page = directory + "/p.html", journal = directory + "/j";
+  const Lines outputs = {"--sarif", sarif, "--html", page, "--journal", journal, probe.path()};
+  ASSERT_EQ(Simulated(outputs).status, 0);
+  Lines words = {"--junit", "/nowhere/j"};
+  words.insert(words.end(), outputs.begin(), outputs.end());
+  const std::string problem = "cannot write the JUnit report /nowhere/j: No such file or directory";
+  const ProcessResult result = Simulated(words);
+  EXPECT_EQ(result.status, 3);
+  EXPECT_EQ(result.output, "");
+  EXPECT_EQ(result.errors, "apktoolkit-sim: " + problem + "\n");
+  EXPECT_EQ(Json::parse(ContentOf(sarif))["runs"][0]["results"][0]["ruleId"], "not-begun");
+  EXPECT_NE(ContentOf(page).find("no file could be simulated: " + problem), std::string::npos);
+  EXPECT_EQ(ContentOf(journal), "{\"event\":\"journal\",\"version\":1}\n");
+}
+
+// One message for each output, and the SARIF log says that the run failed.
+TEST(ExitStatus, ThreeOnceWhenTheDiskIsFull) {
+  const Probe probe({"sign 3 0000"});
+  const std::string sarif = probe.directory() / "s.sarif";
+  const ProcessResult result = Simulated({"--quiet", "--journal", "/dev/full", "--sarif", sarif,
+                                          probe.path(), probe.path(), probe.path()});
+  EXPECT_EQ(result.status, 3);
+  EXPECT_EQ(result.errors,
+            "apktoolkit-sim: cannot write the journal /dev/full: No space left on device\n");
+  const Json invocation = Json::parse(ContentOf(sarif))["runs"][0]["invocations"][0];
+  EXPECT_EQ(invocation["executionSuccessful"], false);
+  EXPECT_EQ(invocation["toolExecutionNotifications"].size(), 1U);
+}
+
 TEST(ExitStatus, ThreeWhenAReportCannotBeWritten) {
   const Probe probe({"sign 3 0100ab"});
   const ProcessResult junit = Simulated({"--quiet", "--junit", "/dev/full", probe.path()});
