@@ -73,7 +73,7 @@ std::optional<std::string> Installation::LayOut(const std::string& file, Install
   if (layout.empty()) return {};
 
   std::string directory = fs::temp_directory_path(error).string() + "/apktoolkit-sim.XXXXXX";
-  if (error) return error.message();
+  if (error) return "TMPDIR: " + error.message();
   const auto failure = [](const std::string& path, int number) {
     return path + ": " + strerrordesc_np(number);
   };
