@@ -6,6 +6,7 @@
 #include "simulator/installer/installer.h"
 #include "simulator/options.h"
 #include "simulator/run/file_list.h"
+#include "simulator/run/file_watch.h"
 #include "simulator/run/process.h"
 #include "simulator/run/queue.h"
 #include "simulator/run/simulator.h"
@@ -50,6 +51,7 @@ int main(int argc, char** argv) {
   RunInOrder(
       files.size(), options.run.jobs,
       [&](size_t i) {
+        const FileWatch watch(files[i].name);
         // The two do not know of each other, and so they work at the same time.
         const bool is_run = files[i].state == ListedFile::State::kToRun;
         auto judged = std::async(std::launch::async, [&] {
@@ -57,6 +59,10 @@ int main(int argc, char** argv) {
         });
         runs[i] = std::make_unique<FileRun>(simulator.Run(files[i]));
         judgements[i] = judged.get();
+        watch.Check(runs[i].get());
+        if (IsInterrupted() && judgements[i].state == Judgement::State::kGaveUp) {
+          runs[i]->record.failure = {Failure::Kind::kInterrupted, ""};
+        }
       },
       [&](size_t i) {
         const auto owned = std::move(runs[i]);

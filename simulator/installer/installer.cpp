@@ -94,7 +94,9 @@ bool Installer::Start() {
   posix_spawn_file_actions_adddup2(&actions, theirs.get(), STDOUT_FILENO);
   posix_spawn_file_actions_addopen(&actions, STDERR_FILENO, "/dev/null", O_WRONLY, 0);
   posix_spawn_file_actions_addclosefrom_np(&actions, STDERR_FILENO + 1);
-  const int error = posix_spawnp(&process_, arguments[0], &actions, nullptr, arguments, environ);
+  const OwnProcessGroup group;
+  const int error =
+      posix_spawnp(&process_, arguments[0], &actions, group.get(), arguments, environ);
   posix_spawn_file_actions_destroy(&actions);
   if (error != 0) pipe_.reset();
   return error == 0;

@@ -34,11 +34,16 @@ bool KeepStandardStreams() {
 void CatchInterruptions() {
   struct sigaction action = {};
   action.sa_handler = Catch;
-  for (const int signal : {SIGINT, SIGTERM, SIGHUP, SIGPIPE}) {
+  for (const int signal : {SIGINT, SIGTERM, SIGHUP, SIGQUIT, SIGPIPE}) {
     struct sigaction before = {};
     sigaction(signal, nullptr, &before);
     if (before.sa_handler != SIG_IGN) sigaction(signal, &action, nullptr);
   }
+}
+
+OwnProcessGroup::OwnProcessGroup() {
+  posix_spawnattr_init(&attributes_);
+  posix_spawnattr_setflags(&attributes_, POSIX_SPAWN_SETPGROUP);  // of its own number
 }
 
 bool IsInterrupted() { return caught != 0; }

@@ -1,6 +1,8 @@
 // This process: its standard streams, its interruption by a signal, and the time limit for a file.
 #pragma once
 
+#include <spawn.h>
+
 #include <chrono>
 
 namespace simulator {
@@ -17,6 +19,22 @@ void CatchInterruptions();
 bool IsInterrupted();
 // If a signal was caught, ends the process by that signal.
 void EndIfInterrupted();
+
+// For posix_spawn: the new process gets a process group of its own. A signal from the keyboard goes
+// to a whole group, and must reach this process alone: it then ends the others, and does not take
+// their end for their own.
+class OwnProcessGroup {
+ public:
+  OwnProcessGroup();
+  ~OwnProcessGroup() { posix_spawnattr_destroy(&attributes_); }
+  OwnProcessGroup(const OwnProcessGroup&) = delete;
+  OwnProcessGroup& operator=(const OwnProcessGroup&) = delete;
+
+  const posix_spawnattr_t* get() const { return &attributes_; }
+
+ private:
+  posix_spawnattr_t attributes_;
+};
 
 // The time limit for the work on one file.
 class Deadline {

@@ -42,6 +42,7 @@ struct Failure {
     kStandInsMissing,
     kStateNotKept,
     kNotInstalled,
+    kChanged,
   };
 
   Kind kind = Kind::kNone;

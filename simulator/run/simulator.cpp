@@ -96,8 +96,6 @@ FileRun Simulator::Run(const ListedFile& listed) {
   const auto problem = installation.LayOut(file, options_.install, options_.abi, task.deadline);
   if (problem) Fail(Failure::Kind::kNotInstalled, *problem, &task);
   const std::string& installed = installation.path();
-  struct stat before = {};
-  const bool is_there = stat(installed.c_str(), &before) == 0 && S_ISREG(before.st_mode);
   task.path = Resolved(installed);
   Event start("start");
   start.Text("file", file).Text("path", Resolved(file));
@@ -119,9 +117,6 @@ FileRun Simulator::Run(const ListedFile& listed) {
   // A run that cannot be judged needs no facts.
   if (task.failure.kind != Failure::Kind::kNone) return run;
   run.facts = LookAt(installed, [&task] { return task.deadline.HasPassed(); });
-  struct stat after = {};
-  const bool is_same = stat(installed.c_str(), &after) == 0 && IsSameFile(before, after);
-  run.facts.was_changed = run.facts.was_changed || (is_there && !is_same);
   return run;
 }
 
@@ -142,6 +137,7 @@ void Simulator::RunToolFor(const std::string& file, Task* task) {
       return Fail(Failure::Kind::kTimedOut, "", task);
     case ToolEnd::How::kKilled:
       Event("exit").Number("signal", end.value).AppendTo(task->journal.get());
+      if (IsInterrupted()) return Fail(Failure::Kind::kInterrupted, "", task);
       break;
     case ToolEnd::How::kExited:
       Event("exit").Number("status", end.value).AppendTo(task->journal.get());

@@ -80,9 +80,10 @@ int Spawn(Words words, Words environment, pid_t* child) {
   posix_spawn_file_actions_init(&actions);
   posix_spawn_file_actions_addopen(&actions, STDOUT_FILENO, "/dev/null", O_WRONLY, 0);
   posix_spawn_file_actions_addclosefrom_np(&actions, STDERR_FILENO + 1);
+  const OwnProcessGroup group;
   const std::string program = words[0];
-  const int error = posix_spawnp(child, program.c_str(), &actions, nullptr, Pointers(&words).data(),
-                                 Pointers(&environment).data());
+  const int error = posix_spawnp(child, program.c_str(), &actions, group.get(),
+                                 Pointers(&words).data(), Pointers(&environment).data());
   posix_spawn_file_actions_destroy(&actions);
   return error;
 }

@@ -101,6 +101,8 @@ inline constexpr Cause kNotInstalled = {"not-installed", Group::kSimulation, Sev
 inline constexpr Cause kNotBegun = {"not-begun", Group::kSimulation, Severity::kFailed,
     ChainLink::kKey, "", "no file could be simulated: %s",
     "Fix the reported error, and run again."};
+inline constexpr Cause kFileChanged = {"file-changed", Group::kSimulation, Severity::kFailed,
+    ChainLink::kKey, "", "it was changed during the run", "Run again when nobody writes to it."};
 inline constexpr Cause kInterrupted = {"interrupted", Group::kSimulation, Severity::kFailed,
     ChainLink::kKey, "", "it was interrupted", "Run it again."};
 
@@ -479,10 +481,6 @@ inline constexpr Cause kBlockAmbiguous = {"block-ambiguous", Group::kWarning, Se
 inline constexpr Cause kOtherPackageName = {"other-package-name", Group::kWarning, Severity::kAlarm,
     ChainLink::kNone, "", "phones install it as %s, but the tool reads another package name",
     "Build the package again with aapt or aapt2. If it is not of your making: do not trust it."};
-inline constexpr Cause kFileChanged = {"file-changed", Group::kWarning, Severity::kAlarm,
-    ChainLink::kNone, "",
-    "it was changed during the run, so parts of this answer may be about other bytes",
-    "Run again when nobody writes to it."};
 inline constexpr Cause kNotLookedInto = {"not-looked-into", Group::kWarning, Severity::kAlarm,
     ChainLink::kNone, "", "%s is too large and was not read, so this answer leaves it out",
     "Do not trust this package, if it is not of your making: in real packages it is small."};

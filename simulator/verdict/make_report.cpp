@@ -159,7 +159,8 @@ Reason WhyFailed(const Failure& failure) {
                                       &cause::kInterrupted,
                                       &cause::kStandInsMissing,
                                       &cause::kStateNotKept,
-                                      &cause::kNotInstalled};
+                                      &cause::kNotInstalled,
+                                      &cause::kFileChanged};
   return {kCauses[static_cast<size_t>(failure.kind)], failure.detail};
 }
 

@@ -27,7 +27,6 @@ std::vector<Reason> FindWarnings(const RunRecord& run, const PackageFacts& facts
                                  const Report& report, int64_t now) {
   Reasons warnings;
   const bool is_package = report.items[0].kind == ItemKind::kPackage;
-  if (facts.was_changed) warnings.push_back({&cause::kFileChanged, ""});
   if (is_package) {
     WarnOfTwoFaces(facts, report, &warnings);
     WarnOfSigners(facts, report, &warnings);

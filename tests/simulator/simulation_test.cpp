@@ -99,23 +99,33 @@ TEST(Files, HaveNoColoursWhereTheUserWantsNone) {
   EXPECT_EQ(shown("-u NO_COLOR"), "\x1b[32mTRUSTED JAR\x1b[0m  " + good.path() + "\r\n");
 }
 
-// Runs a command, sends it `signal` as soon as a file that `pattern` names has something in it, and
-// gives the signal by which it ended (0 if by none) and the seconds that this took.
+// Runs a command in a process group of its own. As soon as a file that `pattern` names has
+// something in it, sends `signal` to the command, or to the whole group, as the keyboard does.
+// Gives the signal by which the command ended (0 if by none) and the seconds that this took.
 struct Interrupted {
-  Interrupted(const std::string& pattern, const Lines& words, int signal = SIGTERM) {
+  enum class Target { kCommand, kGroup };
+
+  Interrupted(const std::string& pattern, const Lines& words, int signal = SIGTERM,
+              Target target = Target::kCommand) {
     const TempDir directory;
     const std::string out = directory / "out";
-    Lines command = {"python3", "-c", R"(
+    Lines command = {"python3",
+                     "-c",
+                     R"(
 import glob, os, signal, subprocess, sys, time
-out, pattern, number, command = sys.argv[1], sys.argv[2], int(sys.argv[3]), sys.argv[4:]
+out, pattern, number, target, command = *sys.argv[1:3], int(sys.argv[3]), sys.argv[4], sys.argv[5:]
 signal.signal(number, signal.SIG_DFL)
-child = subprocess.Popen(command, stdout=open(out, "w"))
+child = subprocess.Popen(command, stdout=open(out, "w"), start_new_session=True)
 while child.poll() is None and not any(os.path.getsize(name) for name in glob.glob(pattern)):
     time.sleep(0.02)
 begin = time.monotonic()
-child.send_signal(number)
+(os.killpg if target == "group" else os.kill)(child.pid, number)
 status = child.wait()
-print(-status, time.monotonic() - begin))", out, pattern, std::to_string(signal)};
+print(-status, time.monotonic() - begin))",
+                     out,
+                     pattern,
+                     std::to_string(signal),
+                     target == Target::kGroup ? "group" : "command"};
     command.insert(command.end(), words.begin(), words.end());
     std::istringstream(RunProcess(command).output) >> ended_by >> seconds;
     output = ContentOf(out);
@@ -127,7 +137,7 @@ print(-status, time.monotonic() - begin))", out, pattern, std::to_string(signal)
 };
 
 TEST(Interruption, EndsTheToolAndTheSimulatorByTheSignal) {
-  for (const int signal : {SIGTERM, SIGINT, SIGHUP}) {
+  for (const int signal : {SIGTERM, SIGINT, SIGHUP, SIGQUIT}) {
     const Probe slow({"sign 3 0000", "pid", "sleep 60"});
     const std::string pid = slow.path() + ".pid";
     const Interrupted run(
@@ -140,6 +150,35 @@ TEST(Interruption, EndsTheToolAndTheSimulatorByTheSignal) {
         "   it was interrupted\n  ✗ tool  it was interrupted\n      Run it again.\n";
     EXPECT_EQ(run.output.substr(0, start.size()), start);
   }
+}
+
+// The keyboard signals the tool as well. Its end is not the file's fault.
+TEST(Interruption, OfTheWholeProcessGroupIsNoRefusal) {
+  const Probe slow({"sign 3 0000", "pid", "sleep 60"});
+  const std::string sarif = slow.directory() / "log.sarif";
+  const Interrupted run(
+      slow.path() + ".pid",
+      {SimulatorPath(), "--quiet", "--sarif", sarif, "--tool", PROBE_PATH, slow.path()}, SIGINT,
+      Interrupted::Target::kGroup);
+  EXPECT_EQ(run.ended_by, SIGINT);
+  EXPECT_EQ(run.output, "NOT SIMULATED  " + slow.path() + "   it was interrupted\n");
+  const Json log = Json::parse(ContentOf(sarif), nullptr, false);
+  EXPECT_EQ(log["runs"][0]["invocations"][0]["executionSuccessful"], false);
+}
+
+// The tool has long ended. Without the verifier's answer there is no result.
+TEST(Interruption, WhileTheInstallerIsAskedIsNoAnswerOfTheInstaller) {
+  const TempDir directory;
+  const std::string file = directory / "base.apk", pid = directory / "pid";
+  MakePackage().WriteTo(file);
+  const std::string java = directory.Write(
+      "java", ToBytes("#!/bin/sh\nsleep 0.3\necho $$ >" + pid + "\nexec sleep 60\n"));
+  ASSERT_EQ(chmod(java.c_str(), 0755), 0);
+  const Interrupted run(pid, {"bash", "-c", "PATH=\"$0:$PATH\" exec \"$@\"", directory.path(),
+                              SimulatorPath(), "--quiet", "--installer=required", file});
+  EXPECT_EQ(run.ended_by, SIGTERM);
+  EXPECT_EQ(run.output, "NOT SIMULATED  " + file + "   it was interrupted\n");
+  EXPECT_EQ(kill(std::stoi(ContentOf(pid)), 0), -1) << "the verifier has ended, too";
 }
 
 // The reader takes one byte and ends. By then the large packages are being laid out.
@@ -358,17 +397,32 @@ std::string RunnerThat(const std::string& does, const TempDir& directory) {
   return runner;
 }
 
-TEST(Simulation, TellsThatTheFileWasChangedMeanwhile) {
+TEST(Simulation, HasNoResultForAFileThatWasChangedMeanwhile) {
   if (AreProgramsEmulated()) GTEST_SKIP() << "there is a runner already";
   const TempDir directory;
   const std::string file = directory / "base.apk";
   MakePackage().WriteTo(file);
-  const std::string runner = RunnerThat("touch " + file, directory);
-  const std::string changed = "   ! it was changed during the run";
-  EXPECT_NE(Told({"--quiet", "--runner", runner, file}).output.find(changed), std::string::npos);
-  EXPECT_EQ(Told({"--quiet", file}).output.find(changed), std::string::npos);
+  const ProcessResult changed =
+      Told({"--quiet", "--runner", RunnerThat("touch " + file, directory), file});
+  EXPECT_EQ(changed.output, "NOT SIMULATED  " + file + "   it was changed during the run\n");
+  EXPECT_EQ(changed.status, 3);
+  EXPECT_EQ(Told({"--quiet", file}).status, 0);
   // A file that the tool could not open does not count as changed.
-  EXPECT_EQ(Told({"--quiet", directory.path()}).output.find(changed), std::string::npos);
+  EXPECT_EQ(Told({"--quiet", directory.path()}).status, 1);
+}
+
+// Each run makes and removes a hard link to the file, for its own installation.
+TEST(Simulation, RunsOverOneFileAtTheSameTimeDoNotDisturbEachOther) {
+  const TempDir directory;
+  PackageOptions options;
+  options.entries.push_back({"lib/arm64-v8a/liba.so", ToBytes("a")});
+  const std::string file = directory / "base.apk";
+  MakePackage(options).WriteTo(file);
+  Lines words = {"--installer=off", "--jobs", "8"};
+  words.insert(words.end(), 40, file);
+  const ProcessResult result = Told(words);
+  EXPECT_EQ(result.output.find("changed"), std::string::npos) << result.output;
+  EXPECT_EQ(result.output.find("NOT SIMULATED"), std::string::npos);
 }
 
 // The directory is mapped by the tool and by the simulator, and is cut off again and again.
@@ -385,7 +439,7 @@ TEST(Simulation, SurvivesAFileThatShrinksAndGoesOnToTheNext) {
       "(while [ ! -e end ]; do truncate -s 3000 base.apk; cp whole.apk base.apk; done) & loop=$!\n"
       "for i in $(seq 30); do\n"
       "  \"$sim\" --installer=off --install=no --quiet base.apk good.apk >out; status=$?\n"
-      "  [ $status = 1 ] || [ $status = 0 ] || echo \"status $status\"\n"
+      "  [ $status = 3 ] || [ $status = 1 ] || [ $status = 0 ] || echo \"status $status\"\n"
       "  grep -q '^SIGNED  good.apk' out || cat out\ndone; touch end; wait $loop";
   const ProcessResult result =
       RunProcess({"bash", "-c", script, "bash", directory.path(), SimulatorPath()});

@@ -70,11 +70,11 @@ TEST(MakeReport, DamagedEntriesAreADoubtAndForTheStrictARefusal) {
 
 TEST(MakeReport, OtherWarningsAreNoRefusalForTheStrict) {
   PackageFacts facts;
-  facts.was_changed = true;
+  facts.too_long = {"a"};
   const Report report = Made({kFileStart, Sign(kFile, kPackagePayload)}, facts, {true});
   EXPECT_EQ(ItemsOf(report), Lines({"package done"}));
   ASSERT_EQ(report.warnings.size(), 1U);
-  EXPECT_EQ(report.warnings[0].cause, &cause::kFileChanged);
+  EXPECT_EQ(report.warnings[0].cause, &cause::kNotLookedInto);
 }
 
 TEST(MakeReport, ErrorThatNoLineTellsTheUseOfCounts) {
@@ -233,7 +233,8 @@ TEST(MakeReport, EachFailureHasItsCause) {
       {Failure::Kind::kInterrupted, &cause::kInterrupted},
       {Failure::Kind::kStandInsMissing, &cause::kStandInsMissing},
       {Failure::Kind::kStateNotKept, &cause::kStateNotKept},
-      {Failure::Kind::kNotInstalled, &cause::kNotInstalled}};
+      {Failure::Kind::kNotInstalled, &cause::kNotInstalled},
+      {Failure::Kind::kChanged, &cause::kFileChanged}};
   for (const auto& [kind, why] : rows) {
     RunRecord record = Record({Sign(kFile, kPackagePayload)});
     record.failure = {kind, "x"};

@@ -187,13 +187,11 @@ TEST(Warnings, SchemesThatWereStripped) {
 
 // ---- The file.
 
-TEST(Warnings, FileThatChangedOrIsNotLookedInto) {
+TEST(Warnings, FileWithPartsThatAreNotLookedInto) {
   PackageFacts facts = Good();
-  facts.was_changed = true;
   facts.has_damaged_signing_block = true;
   facts.too_long = {"a", "b"};
-  const Lines expected = {"file-changed: ", "signing-block-damaged: ", "not-looked-into: a",
-                          "not-looked-into: b"};
+  const Lines expected = {"signing-block-damaged: ", "not-looked-into: a", "not-looked-into: b"};
   EXPECT_EQ(Warnings(facts), expected);
   EXPECT_EQ(Warnings(facts, ReportOf(facts, ItemKind::kJar)), expected);
 }

@@ -1,0 +1,30 @@
+// Notices that a file is changed while it is looked at. The tool, the simulator and the installer's
+// verifier read a file one after the other; if it changes, their answers are about different bytes.
+#pragma once
+
+#include <sys/stat.h>
+
+#include <string>
+
+#include "simulator/run/simulator.h"
+
+namespace simulator {
+
+class FileWatch {
+ public:
+  // Remembers the state of the file at `path`. Make it before anything reads the file.
+  explicit FileWatch(const std::string& path);
+
+  // Call it when nothing reads the file any more. If the file was changed since, the run gets a
+  // failure in place of its result. A change of the inode alone, by a hard link or chmod, is none
+  // if the bytes still have the digest that the run found. Does nothing if `path` was no file.
+  void Check(FileRun* run) const;
+
+ private:
+  bool WasChanged(const std::string& sha256) const;
+
+  const std::string path_;
+  struct stat before_ = {};
+};
+
+}  // namespace simulator
