@@ -15,6 +15,35 @@
 #include "simulator/verdict/make_report.h"
 #include "simulator/verdict/wording.h"
 
+namespace simulator {
+
+namespace {
+
+// The answers of the tool and of the phones' installer about one file.
+struct Answers {
+  FileRun run;
+  Judgement judgement;
+};
+
+// The two do not know of each other, and so they work at the same time.
+Answers Ask(const ListedFile& file, Simulator* simulator, Installer* installer) {
+  const FileWatch watch(file.name);
+  const bool is_run = file.state == ListedFile::State::kToRun;
+  auto judgement = std::async(std::launch::async,
+                              [&] { return is_run ? installer->Judge(file.name) : Judgement(); });
+  FileRun run = simulator->Run(file);
+  Answers answers = {std::move(run), judgement.get()};
+  watch.Check(&answers.run);
+  if (IsInterrupted() && answers.judgement.state == Judgement::State::kGaveUp) {
+    answers.run.record.failure = {Failure::Kind::kInterrupted, ""};
+  }
+  return answers;
+}
+
+}  // namespace
+
+}  // namespace simulator
+
 int main(int argc, char** argv) {
   using namespace simulator;
   const bool has_standard_input = KeepStandardStreams();
@@ -46,29 +75,16 @@ int main(int argc, char** argv) {
              others + " below the directories left out, by their names: not a package's");
   }
   CatchInterruptions();
-  std::vector<std::unique_ptr<FileRun>> runs(files.size());
-  std::vector<Judgement> judgements(files.size());
+  std::vector<std::unique_ptr<Answers>> answers(files.size());
   RunInOrder(
       files.size(), options.run.jobs,
       [&](size_t i) {
-        const FileWatch watch(files[i].name);
-        // The two do not know of each other, and so they work at the same time.
-        const bool is_run = files[i].state == ListedFile::State::kToRun;
-        auto judged = std::async(std::launch::async, [&] {
-          return is_run ? installer.Judge(files[i].name) : Judgement();
-        });
-        runs[i] = std::make_unique<FileRun>(simulator.Run(files[i]));
-        judgements[i] = judged.get();
-        watch.Check(runs[i].get());
-        if (IsInterrupted() && judgements[i].state == Judgement::State::kGaveUp) {
-          runs[i]->record.failure = {Failure::Kind::kInterrupted, ""};
-        }
+        answers[i] = std::make_unique<Answers>(Ask(files[i], &simulator, &installer));
       },
       [&](size_t i) {
-        const auto owned = std::move(runs[i]);
-        const FileRun& run = *owned;
-        const Judgement judgement = std::exchange(judgements[i], {});
-        Report report = MakeReport(run.record, run.facts, options.judge, judgement);
+        const auto owned = std::move(answers[i]);
+        const FileRun& run = owned->run;
+        Report report = MakeReport(run.record, run.facts, options.judge, owned->judgement);
         gate.Judge(&report);
         if (options.verify) {
           presenter.ShowAnswer(run.record, report, run.journal);
