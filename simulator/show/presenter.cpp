@@ -49,12 +49,12 @@ Presenter::Presenter(const ShowOptions& options, size_t file_count)
 std::optional<std::string> Presenter::Objection(const std::vector<std::string>& inputs) const {
   const std::array<const OutputFile*, 4> files = {&journal_, &page_file_, &junit_file_,
                                                   &sarif_file_};
-  for (auto file = files.begin(); file != files.end(); ++file) {
-    for (auto other = file + 1; other != files.end(); ++other) {
-      if (!(*file)->IsSameAs(**other)) continue;
-      return std::string((*file)->option()) + " and " + (*other)->option() + " name the same file";
+  for (size_t i = 0; i < files.size(); ++i) {
+    for (size_t j = i + 1; j < files.size(); ++j) {
+      if (!files[i]->IsSameAs(*files[j])) continue;
+      return std::string(files[i]->option()) + " and " + files[j]->option() + " name the same file";
     }
-    if (auto objection = (*file)->Objection(inputs)) return objection;
+    if (auto objection = files[i]->Objection(inputs)) return objection;
   }
   return {};
 }
