@@ -50,6 +50,7 @@ endif()
 
 option(APKTOOLKIT_COVERAGE "Count the lines that run (scripts/coverage)" OFF)
 if(APKTOOLKIT_COVERAGE)
-  add_compile_options(--coverage -O0)
+  # Threads count the same lines. Without atomic counters some counts become negative.
+  add_compile_options(--coverage -O0 -fprofile-update=atomic)
   add_link_options(--coverage)
 endif()
