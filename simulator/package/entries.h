@@ -35,6 +35,8 @@ struct PackageEntries {
 
 // True if the time is up.
 using IsLate = std::function<bool()>;
+// For callers without a limit.
+inline bool IsNeverLate() { return false; }
 
 // `manifest`: the text of META-INF/MANIFEST.MF; may be empty.
 PackageEntries CompareEntries(Archive* archive, std::vector<uint8_t> manifest,

@@ -71,13 +71,11 @@ struct PackageFacts {
 
 // Looks at the file at `path`, and at the libraries beside it. Reads no pipes and no devices, and
 // never waits. Compares no more entries with the manifest after `is_late` returns true.
-PackageFacts LookAt(
-    const std::string& path, const IsLate& is_late = [] { return false; });
+PackageFacts LookAt(const std::string& path, const IsLate& is_late = IsNeverLate);
 
 // The SHA-256 digest of the bytes of an open file, in lower-case hexadecimal; empty if they cannot
 // be read, or if `is_late` returns true before their end.
-std::string FileSha256(
-    int fd, const IsLate& is_late = [] { return false; });
+std::string FileSha256(int fd, const IsLate& is_late = IsNeverLate);
 
 // The names of the file's schemes after v1, each once, in the file's order.
 std::vector<std::string> NewerSchemes(const PackageFacts& facts);

@@ -14,8 +14,7 @@ FileWatch::FileWatch(const std::string& path) : path_(path) {
 void FileWatch::Check(FileRun* run) const {
   Failure& failure = run->record.failure;
   if (failure.kind != Failure::Kind::kNone || !S_ISREG(before_.st_mode)) return;
-  const bool was_changed = run->facts.was_changed || WasChanged(run->facts.sha256);
-  if (was_changed) failure = {Failure::Kind::kChanged, ""};
+  if (WasChanged(run->facts.sha256)) failure = {Failure::Kind::kChanged, ""};
 }
 
 bool FileWatch::WasChanged(const std::string& sha256) const {

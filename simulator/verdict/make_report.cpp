@@ -37,6 +37,7 @@ Report MakeReport(const RunRecord& run, const PackageFacts& facts, const JudgeOp
   report.file_sha256 = facts.sha256;
   report.tool = run.tool;
   Reason failure = WhyFailed(run.failure);
+  if (failure.cause == nullptr && facts.was_changed) failure = {&cause::kFileChanged, ""};
   if (failure.cause == nullptr && run.is_silent && !run.signal) {
     const Reason unseen = WhyNotLookedAt(run, facts);
     if (run.status != 0) {

@@ -76,15 +76,6 @@ TEST(FileWatch, ChangeOfTheInodeAloneCountsIfTheBytesDiffer) {
   EXPECT_TRUE(IsNoticed([](const std::string& file) { ChangeTheInodeAlone(file, "abc"); }, ""));
 }
 
-TEST(FileWatch, FileThatShrankWhileItWasReadIsChanged) {
-  const TempDir directory;
-  const FileWatch watch(directory.Write("file", ToBytes("abc")));
-  FileRun run;
-  run.facts.was_changed = true;
-  watch.Check(&run);
-  EXPECT_EQ(run.record.failure.kind, Failure::Kind::kChanged);
-}
-
 TEST(FileWatch, LeavesARunAloneThatHasNoResultOrNoFile) {
   const TempDir directory;
   const std::string file = directory.Write("file", ToBytes("abc"));

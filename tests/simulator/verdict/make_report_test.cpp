@@ -244,6 +244,14 @@ TEST(MakeReport, EachFailureHasItsCause) {
   }
 }
 
+TEST(MakeReport, FileThatShrankWhileItWasReadHasNoResult) {
+  PackageFacts facts;
+  facts.was_changed = true;
+  const Report report = Made({kFileStart, Sign(kFile, kPackagePayload)}, facts);
+  EXPECT_EQ(report.verdict, Verdict::kNotSimulated);
+  EXPECT_EQ(report.items[0].reason.cause, &cause::kFileChanged);
+}
+
 TEST(MakeReport, EachVerdictHasItsStatus) {
   EXPECT_EQ(StatusOf(Verdict::kSigned), 0);
   EXPECT_EQ(StatusOf(Verdict::kTrustedJar), 0);
