@@ -42,6 +42,7 @@ void PageTable::Add(const Report& report) {
 
 void PageTable::Fill(data* page) const {
   std::vector<std::string> files;
+  files.reserve(rows_.size());
   for (const Row& row : rows_) files.push_back(row.file);
   const std::string directory = CommonDirectory(files);
   list rows;
@@ -85,6 +86,7 @@ list PageTable::Choices() const {
 
 std::vector<const PageTable::Row*> PageTable::WorstFirst() const {
   std::vector<const Row*> sorted;
+  sorted.reserve(rows_.size());
   for (const Row& row : rows_) sorted.push_back(&row);
   std::stable_sort(sorted.begin(), sorted.end(), [](const Row* a, const Row* b) {
     if (a->verdict != b->verdict) return RankOf(a->verdict) < RankOf(b->verdict);
