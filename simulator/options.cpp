@@ -68,7 +68,7 @@ std::optional<int> ParseOptions(int argc, char** argv, Options* options) {
   app.footer(kFooter);
   app.get_formatter()->column_width(28);
   app.allow_extras();  // NameUnknownOption names them
-  options->installer.program = ProgramDirectory() + "/../lib/apktoolkit/installer.jar";
+  options->installer.program = ProgramDirectory() + "/../share/apktoolkit/installer.jar";
   std::string runner;
 
   app.add_option("FILE", options->files.names, "Packages, JARs or other files")->type_name("");
