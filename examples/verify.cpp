@@ -1,6 +1,6 @@
-// Tells whether a package's JAR signature is good, and who signed it. It shows what a program looks
-// like that links the verification. It signs nothing. Phones may install the package for another
-// signer than this one: README.md tells how to compare the two.
+// Prints whether a package's JAR signature is good, and who made it. This is an example of a
+// program that links the verification. It signs nothing. Phones may install the package for another
+// signer: README.md shows how to compare the two signers.
 #include <fcntl.h>
 #include <unistd.h>
 
@@ -22,7 +22,7 @@ void PrintSigner(const ApkTools::Apk& apk) {
   printf("\n");
 }
 
-// The archive is released before the descriptor is closed.
+// A function of its own, so that the archive is released before main() closes the descriptor.
 bool IsGood(const char* name, int fd) {
   ApkTools::Verification verification(fd);
   const ApkTools::Reason reason = verification.reason();
@@ -37,8 +37,8 @@ bool IsGood(const char* name, int fd) {
 
 }  // namespace
 
-// Exit status: 0 a good package; 1 another file; 2 a wrong command line, or the file cannot be
-// opened.
+// Exit status: 0 if the package is good, 1 if the file is refused, 2 if the command line is wrong
+// or the file cannot be opened.
 int main(int argc, char* argv[]) {
   if (argc != 2) {
     fprintf(stderr, "usage: verify FILE\n");
