@@ -1,6 +1,7 @@
-// Reads the compiled Android manifest: the package's name, and whether it asks for secure storage.
-// A hostile document makes the parser return the same long texts again and again. Texts are
-// therefore compared as UTF-16, by length first, and only the package's name is converted.
+// Reads two facts from the compiled Android manifest: the package's name, and whether the package
+// asks for secure storage. A hostile document makes the parser return the same long texts again and
+// again. Texts are therefore compared as UTF-16, by length first, and only the package's name is
+// converted.
 #include <androidfw/ResourceTypes.h>
 #include <utils/String8.h>
 
@@ -32,8 +33,9 @@ uint16_t FirstUnit(Text text);
 }  // namespace
 
 bool Apk::ParseAndroidManifest(std::vector<uint8_t> bytes) {
-  // The parser reads a header or an attribute without checking that all of it is there. The buffer
-  // therefore has room for one more behind it. Bytes shorter than a header are not a document.
+  // The platform's parser does not check that a whole header or attribute is there before it reads
+  // one. The buffer is therefore longer than the document by one attribute, the larger of the two.
+  // A document shorter than a header is passed as empty, which the parser refuses.
   const size_t size = bytes.size(), room = size + sizeof(android::ResXMLTree_attribute);
   bytes.reserve(room);
   bytes.resize(room);
@@ -49,7 +51,7 @@ bool Apk::ParseAndroidManifest(std::vector<uint8_t> bytes) {
   std::set<const char16_t*> nameless;
   for (ResXMLParser::event_code_t event = parser.next(); event != ResXMLParser::END_DOCUMENT;
        event = parser.next()) {
-    // Deliberate: a document that turns bad ends there. The facts found before it count.
+    // Deliberate: a malformed node ends the document. The facts found before that node count.
     if (event == ResXMLParser::BAD_DOCUMENT) break;
     // Elements count at any depth.
     if (event != ResXMLParser::START_TAG) continue;
@@ -69,8 +71,8 @@ bool Apk::ParseAndroidManifest(std::vector<uint8_t> bytes) {
 
 namespace {
 
-// A text of unpaired surrogates alone converts to an empty text. It is converted only once and then
-// kept in `nameless`.
+// A text that has only unpaired surrogates converts to an empty text. `nameless` has the address of
+// each converted text, so that no text is converted twice.
 String8 ReadPackageName(const ResXMLParser& parser, std::set<const char16_t*>* nameless) {
   const Text name = getStrAttr(parser, "package");
   if (name.empty() || !nameless->insert(name.data()).second) return String8();
@@ -89,15 +91,16 @@ bool AsksForSecureStorage(const ResXMLParser& parser, Text element) {
          Equals(name, "com.qix.android.securestorage.permission.SECURE_STORAGE");
 }
 
-// The text of the first attribute that has this name and a text: references and numbers have none.
-// Empty if no attribute matches.
+// The text of the first attribute that has this name and a string as its value. References, numbers
+// and strings without a text are skipped. Empty if no attribute matches.
 Text getStrAttr(const ResXMLParser& parser, std::string_view name) {
   ResXMLParser::ResXMLPosition position;
   parser.getPosition(&position);
   android::ResXMLTree_attrExt tag;
   memcpy(&tag, position.curExt, sizeof(tag));
   for (size_t i = 0; i < parser.getAttributeCount(); ++i) {
-    // Attributes of size 0 all lie at one address: up to 65,535 of them are one attribute.
+    // Attributes of size 0 are all at the same address, so they are all the same attribute. A
+    // document can declare up to 65,535 of them.
     if (i > 0 && tag.attributeSize == 0) break;
     size_t length = 0;
     const char16_t* text = parser.getAttributeName(i, &length);
@@ -114,8 +117,9 @@ Text getStrAttr(const ResXMLParser& parser, std::string_view name) {
   return {};
 }
 
-// True if `text`, converted to UTF-8 by the platform, is `wanted`. That conversion drops unpaired
-// surrogates. Deliberate: this comparison drops them, too, but only a few, so that it stays short.
+// True if the platform would convert `text` to the UTF-8 text `wanted`. The conversion drops
+// unpaired surrogates. Deliberate: a text with more than kMostSurrogates of them does not match, so
+// that no comparison reads a long text.
 bool Equals(Text text, std::string_view wanted) {
   constexpr size_t kMostSurrogates = 16;
   if (text.size() < wanted.size() || text.size() > wanted.size() + kMostSurrogates) return false;
@@ -135,7 +139,7 @@ bool IsUnpairedSurrogate(Text text) {
   return kind == kLow || (kind == kHigh && !is_pair);
 }
 
-// In a hostile document, texts and elements lie at odd addresses.
+// A hostile document can put texts and elements at odd addresses, so they are read with memcpy.
 uint16_t FirstUnit(Text text) {
   uint16_t unit;
   memcpy(&unit, static_cast<const void*>(text.data()), sizeof(unit));

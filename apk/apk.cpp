@@ -7,9 +7,9 @@
 
 namespace ApkTools {
 
-// Deliberate: a pointer that a program may change, not a fixed text. The manifest's entry is looked
-// up through it at each use. The names that need no digest (CanSkipValidation) are a table of their
-// own and do not follow it.
+// Deliberate: this is a pointer that a program may change, not a constant. The pointer is read each
+// time the manifest's entry is looked up. The names that need no digest (CanSkipValidation) are a
+// separate table, which a change of the pointer does not affect.
 const char* Apk::kMANIFEST_MF = "META-INF/MANIFEST.MF";
 
 void Apk::Init(int fd, const char* path) {
@@ -39,8 +39,8 @@ bool Apk::VerifyPackage(std::vector<uint8_t> android_manifest) {
 
   if (!InitCertSf()) return false;
   if (!ValidateManifest(manifest)) {
-    // Deliberate: ValidateManifest has logged the same text. Programs that parse the log match on
-    // the pair.
+    // Deliberate: ValidateManifest has already logged this text. Programs that parse the log match
+    // on the two lines together.
     LogError("Can't validate manifest.\n");
     return false;
   }

@@ -20,8 +20,8 @@ bool Apk::FindFile(const char* path) {
   }
   if (fd_ == -1) {
     fd_ = open(path, O_RDONLY | O_CLOEXEC);
-    // Deliberate: descriptor 0 is a failure, too. It belongs to standard input. open returns it
-    // only in a process that was wrongly started without standard input.
+    // Deliberate: descriptor 0 counts as a failure, because it belongs to standard input. open
+    // returns 0 only in a process that was wrongly started without standard input.
     if (fd_ < 1) {
       LogError("open('%s') failed: %s\n", path, strerror(errno));
       return false;
@@ -31,7 +31,7 @@ bool Apk::FindFile(const char* path) {
   return true;
 }
 
-// With `own_fd`, the archive closes the descriptor.
+// If `own_fd` is true, the descriptor is closed together with the archive.
 bool Apk::OpenZip(bool own_fd) {
   const int32_t result = OpenArchiveFd(fd_, path_.c_str(), &zip_handle_, own_fd);
   if (result != 0) {

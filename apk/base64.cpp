@@ -21,9 +21,10 @@ std::vector<uint8_t> Base64Decode(const std::string& text) {
 int base64decode(const char* in, size_t length, uint8_t* out, size_t* out_length) {
   size_t written = 0;
   uint32_t accumulator = 0;
-  int collected = 0;  // values of 6 bits in the accumulator
-  // Writes the whole bytes of the accumulator; false if they do not fit. Deliberate: leftover bits
-  // are dropped without an error, and so is a single value, which has no whole byte.
+  int collected = 0;  // number of 6-bit values in the accumulator
+  // Writes the whole bytes of the accumulator. Returns false if they do not fit. Deliberate:
+  // leftover bits are dropped without an error. A single value has no whole byte, and is also
+  // dropped.
   const auto flush = [&] {
     const size_t count = collected < 2 ? 0 : static_cast<size_t>(collected) - 1;
     if (*out_length - written < count) return false;

@@ -12,8 +12,8 @@ ManifestMf::Section::value_type DigestOf(const ManifestMf::Section& section) {
   return section.findLastEndingIn("-Digest");
 }
 
-// Not std::hash: in older releases its unsigned arithmetic wraps without the mark that sanitizers
-// need, and a product may be built to stop at that.
+// std::hash is not used. In older releases of the C++ library, its unsigned arithmetic wraps and is
+// not marked as intended. A product that is built with the sanitizer for this would stop there.
 size_t Hash(std::string_view name) {
   size_t hash = 0;
   for (const char c : name) hash = (hash << 9 | hash >> 55) ^ static_cast<uint8_t>(c);
@@ -53,7 +53,7 @@ bool EntryDigests::Find(std::string_view name, std::string& digest_name,
     last = first + (equal.second - hashes_.begin());
     first += equal.first - hashes_.begin();
   }
-  // The last of equal names: a later section replaces an earlier one.
+  // Finds the last of equal names, because a later section replaces an earlier one.
   const auto next = std::upper_bound(
       first, last, name,
       [this](std::string_view wanted, uint32_t section) { return wanted < NameOf(section); });
@@ -64,8 +64,9 @@ bool EntryDigests::Find(std::string_view name, std::string& digest_name,
   return true;
 }
 
-// Sorts by the hashes of the names, and by the names where hashes are equal. Hashing reads each
-// name once. That costs less than comparing names that lie all over a text.
+// Sorts by the hashes of the names. Sections with equal hashes are sorted by their names, and then
+// by their place in the text. Hashing reads each name once, which costs less than comparing names
+// that are spread over the text.
 void EntryDigests::Sort() {
   std::vector<std::pair<size_t, uint32_t>> hashed;
   hashed.reserve(sections_.size());

@@ -1,6 +1,6 @@
-// The digests that the manifest records for entries: the manifest itself, and an ordered map from
-// an entry's name to its digest attribute's name and value. Sections that lack one of the three are
-// left out. Only the manifest's parser logs.
+// The digests that the manifest records for entries. The object contains the manifest, and an
+// ordered map from each entry's name to the name and the value of its digest attribute. A section
+// that lacks one of these three texts is left out. Only the manifest's parser logs.
 #pragma once
 
 #include <cstdint>
@@ -26,9 +26,9 @@ class EntryDigests {
   std::string_view NameOf(uint32_t section) const;
 
   ManifestMf manifest_mf_;
-  // The numbers of the sections that count, ordered by entry name (bytes), then by place in the
-  // text. If the text was not in this order, they are ordered first by the hashes of the names,
-  // which are then in hashes_.
+  // The indexes of the listed sections, ordered by the bytes of the entry names, then by place in
+  // the text. If the text is not in this order, the indexes are ordered by the hashes of the names
+  // first. hashes_ then contains these hashes, and is empty otherwise.
   std::vector<uint32_t> sections_;
   std::vector<size_t> hashes_;
 };

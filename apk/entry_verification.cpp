@@ -19,7 +19,7 @@ bool Apk::IsGoodApk() {
   return is_good_apk_;
 }
 
-// A package without this entry passes. An entry that exists but cannot be read does not.
+// Returns true if the package does not have this entry, and false if the entry cannot be read.
 bool Apk::VerifyDex() {
   ZipEntry dex;
   const int32_t result = FindZipEntry(zip_handle_, "classes.dex", &dex);
@@ -36,8 +36,8 @@ bool Apk::VerifyFileHash(const std::string& name, const std::string& path, struc
   return VerifyContent(name, [&] { return ReadFile(path, content_, state, fd); });
 }
 
-// `read_content` fills content_, which is empty before, and returns true for success. It is not
-// called for a name that the manifest does not list.
+// `read_content` fills the empty content_, and returns true for success. It is called only if the
+// manifest lists `name`.
 template <typename ReadContent>
 bool Apk::VerifyContent(const std::string& name, ReadContent read_content) {
   std::string digest_name, digest;

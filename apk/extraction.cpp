@@ -13,7 +13,7 @@ bool IsPlausibleLength(const ZipEntry& entry) {
 int32_t ExtractZipEntry(ZipArchiveHandle archive, ZipEntry* entry, std::vector<uint8_t>& out) {
   if (!IsPlausibleLength(*entry)) return kZipInconsistentInformation;
   if (entry->uncompressed_length > kZipTrustedLength) {
-    // Runs through the data and keeps none of it. Succeeds if there is as much as the entry says.
+    // Reads the data once and discards it. Succeeds only if the data has the declared length.
     const auto keep_nothing = [](const uint8_t*, size_t, void*) { return true; };
     const int32_t result = ProcessZipEntryContents(archive, entry, keep_nothing, nullptr);
     if (result != 0) return result;

@@ -10,21 +10,22 @@
 
 namespace ApkTools {
 
-// The library's codes for the refusals here; its header does not name them.
+// The zip library's codes for the refusals below. The library's header has no names for them.
 inline constexpr int32_t kZipInconsistentInformation = -9;
 inline constexpr int32_t kZipAllocationFailed = -13;
 
-// Up to this length, in bytes, memory is allocated without a trial run through the data.
+// If the length is at most this number of bytes, memory is allocated before the data is read.
 inline constexpr uint32_t kZipTrustedLength = 64 << 20;
 
-// True if the declared length is possible: a stored entry is as long as its data, a deflated one at
-// most 1032 times as long (RFC 1951 section 3.2.5: two bits give at most 258 bytes).
+// True if the declared length is possible. A stored entry is as long as its data. A deflated entry
+// is at most 1032 times as long as its data, because two bits encode at most 258 bytes (RFC 1951
+// section 3.2.5).
 bool IsPlausibleLength(const ZipEntry& entry);
 
-// Extracts the whole entry into `out`, which becomes as long as the entry. Refuses, with `out`
-// unchanged, an entry whose length is impossible (kZipInconsistentInformation). Above
-// kZipTrustedLength it also refuses an entry whose data has another length (the library's code) or
-// that does not fit in memory (kZipAllocationFailed).
+// Extracts the whole entry into `out`, which then has the entry's length. If the declared length is
+// impossible, returns kZipInconsistentInformation and leaves `out` unchanged. Above
+// kZipTrustedLength, `out` also stays unchanged if the data has another length (the library's
+// code), or if the entry does not fit in memory (kZipAllocationFailed).
 int32_t ExtractZipEntry(ZipArchiveHandle archive, ZipEntry* entry, std::vector<uint8_t>& out);
 
 }  // namespace ApkTools

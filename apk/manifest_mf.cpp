@@ -21,24 +21,24 @@ bool IsPlainText(const uint8_t* eight) {
   constexpr uint64_t kLeastPlain = (kGreatestLineEnd + 1) * kEachByte;
   uint64_t bytes;
   memcpy(&bytes, eight, sizeof(bytes));
-  // With its high bit set, no byte borrows from the next. It keeps that bit unless its low seven
-  // bits are below the least plain byte.
+  // Setting the high bit of each byte prevents a borrow from the next byte. The subtraction clears
+  // that bit only if the byte's low seven bits are less than the least plain byte.
   return ((((bytes | kHighBits) - kLeastPlain) | bytes) & kHighBits) == kHighBits;
 }
 
 // The state machine that reads the text of a manifest.
 //
-// It is lenient where signing tools differ. Lines may have any length; CR LF, LF CR, CR and LF end
-// them. A line without a colon becomes part of the next name. It is strict about the byte after a
-// colon. Odd line breaks decide which digest belongs to which entry, so tests pin how they are
-// read.
+// The parser is lenient where signing tools differ. Lines may have any length, and end with CR LF,
+// LF CR, CR or LF. A line without a colon becomes part of the next name. The parser is strict about
+// the byte after a colon. Unusual line breaks decide which digest belongs to which entry, so tests
+// pin how they are read.
 class Parser {
  public:
   Parser(std::vector<uint8_t>& text, ManifestSections& sections)
       : text_(text.data()), size_(text.size()), sections_(sections) {}
 
   // Deliberate: an attribute or section that is still open at the end of the text is dropped. Only
-  // an empty line ends a section, as signing tools write it, even the last section.
+  // an empty line ends a section. Signing tools write one even after the last section.
   bool parse() {
     while (cursor_ < size_) {
       if (!isExpectedState() || !step()) return false;
@@ -53,11 +53,12 @@ class Parser {
     P_COLON,         // at the colon after a name
     P_VALUE,         // at a value
     P_CONTINUATION,  // at a continuation line
-    P_EOL,           // at a line break, what the next line is being open
+    P_EOL,           // at a line break; the kind of the next line is unknown
   };
 
-  // Deliberate: no step sets another state, so no test gets here with one. The guard stays, so that
-  // a state that is added but not handled below cannot make a manifest pass.
+  // Deliberate: no step sets any other state, so no test can reach this message. The guard is kept
+  // for a state that is added later without a case in step(): that state cannot make a manifest
+  // pass.
   bool isExpectedState() const {
     const bool is_expected = state_ <= P_EOL;
     if (!is_expected) LogError("Parse manifest: Unexpected state.\n");
@@ -93,14 +94,14 @@ class Parser {
   }
 
   // Deliberate: a line break does not end a name. A line without a colon becomes the front part of
-  // the next line's name. Nobody looks for such a name.
+  // the next line's name. No code looks for such a name.
   bool readName() {
     storePair();
     size_t end = cursor_;
     while (byteAt(end) != ':' && byteAt(end) != '\0') ++end;
     pending_.name = readTo(end);
     if (byteAt(end) == '\0') {
-      // The log keeps no more of a long name.
+      // A log record keeps at most this part of a long name.
       const size_t shown = std::min<size_t>(pending_.name.length, kLogTextSize);
       const std::string name(reinterpret_cast<const char*>(text_) + pending_.name.start, shown);
       LogError("Parse manifest: Error: P_KEY: unexpected end of file after key '%s'\n",
@@ -111,11 +112,11 @@ class Parser {
     return true;
   }
 
-  // Deliberate: if a line break follows the colon at once, the cursor always moves two bytes past
-  // the colon. With CR LF it is then at the LF. With a lone CR or LF it is at the first byte of the
-  // next line, which is then taken for the line break. A name loses its first byte there, and an
-  // empty line or a continuation line is not seen. Signing tools write CR LF; other files read as
-  // they always have.
+  // Deliberate: if a line break follows the colon directly, the cursor always moves to the second
+  // byte after the colon. After CR LF, that byte is the LF. After a lone CR or LF, it is the first
+  // byte of the next line, and then counts as the line break. A name on the next line loses its
+  // first byte, and an empty line or a continuation line is not recognised. Signing tools write CR
+  // LF. For other files, the result must stay as it always was.
   bool passColon() {
     const char next = byteAt(cursor_ + 1);
     if (next != ' ' && !IsLineBreak(next)) {
@@ -128,7 +129,7 @@ class Parser {
     return true;
   }
 
-  // Moves the line up to the end of the value. The bytes between the two are never read again.
+  // Moves the line to the end of the value. The bytes that were between them are never read again.
   void continueValue() {
     const ManifestPiece line = readLine();
     ManifestPiece& value = pending_.value;
@@ -176,13 +177,14 @@ class Parser {
     }
   }
 
-  // Moves the pending pair into the section if it is whole. Nothing is pending afterwards.
+  // Adds the pending pair to the section if it has a name and a value. Nothing is pending
+  // afterwards.
   void storePair() {
     if (pending_.name.length != 0 && pending_.value.length != 0) sections_.add(pending_);
     pending_ = {};
   }
 
-  // Past the end of the text every byte reads as NUL, which stops every scan.
+  // Every byte past the end of the text reads as NUL, which stops every scan.
   char byteAt(size_t index) const { return index < size_ ? static_cast<char>(text_[index]) : '\0'; }
 
   uint8_t* const text_;

@@ -14,15 +14,16 @@ class ManifestMf {
   using Section = ManifestSection;
   using Sections = ManifestSections;
 
-  // Holds no text and no sections, and is not valid. A moved-from object has no sections either,
-  // but keeps the result. Views into its text now point into the object that received the text.
+  // A new object has no text and no sections, and is not valid. A moved-from object has no
+  // sections, but keeps the result of its last load(). Views into the moved text stay valid: the
+  // object that received the text owns it.
   ManifestMf() = default;
   ManifestMf(ManifestMf&&) = default;
   ManifestMf& operator=(ManifestMf&&) = default;
 
-  // Forgets everything and parses `text`, which may be any bytes. Returns false if it does not
-  // parse; the sections that ended before the fault are kept. A text of 4 GiB or more does not
-  // parse and is not logged: no entry of an archive is that long.
+  // Discards the former text and parses `text`, which may have any bytes. Returns false if `text`
+  // does not parse. The sections that ended before the fault are then kept. A text of 4 GiB or more
+  // is refused without a message, because no entry of an archive is that long.
   bool load(std::vector<uint8_t> text);
   bool load(const std::string& text) {
     return load(std::vector<uint8_t>(text.begin(), text.end()));
@@ -31,8 +32,8 @@ class ManifestMf {
   // The result of the last load().
   explicit operator bool() const { return valid_; }
 
-  // The sections of the last load() that an empty line ended, in the order of the text, the main
-  // section first. Valid until the object is loaded again or moved.
+  // The sections that the last load() found, in the order of the text, the main section first. A
+  // section that no empty line ended is left out. Valid until the object is loaded again or moved.
   const Sections& getSections() const { return sections_; }
 
  private:

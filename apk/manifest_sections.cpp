@@ -26,9 +26,9 @@ std::string_view ManifestSection::find(std::string_view name) const {
   return View(text_, found->value);
 }
 
-// Deliberate: of several digests the last in the order of names counts, so "SHA1-Digest" goes
-// before "SHA-256-Digest", for an entry as for the whole manifest. Packages that carry both have
-// always been judged by this order.
+// Deliberate: if a section has several digests, the last in the byte order of their names counts.
+// "SHA1-Digest" therefore wins over "SHA-256-Digest", both for an entry and for the whole manifest.
+// Packages with both digests have always been verified by this rule.
 ManifestSection::value_type ManifestSection::findLastEndingIn(std::string_view suffix) const {
   for (size_t i = size_; i > 0; --i) {
     if (EndsWith(View(text_, attributes_[i - 1].name), suffix)) return (*this)[i - 1];
@@ -42,9 +42,9 @@ ManifestSection ManifestSections::operator[](size_t index) const {
 }
 
 void ManifestSections::reset(const uint8_t* text, size_t size) {
-  // Few attributes take less text than kShortAttribute, and no archive has more entries than
-  // kManyAttributes can list. A table that grew in steps would waste its former memory. This one
-  // takes memory only as it is filled.
+  // The table is reserved at once, because a table that grows in steps wastes its former memory.
+  // Reserved memory is used only when it is filled. Few attributes take fewer than kShortAttribute
+  // bytes of text. kManyAttributes can list all entries of any archive.
   constexpr size_t kShortAttribute = 32;
   constexpr size_t kManyAttributes = 1 << 17;
   text_ = reinterpret_cast<const char*>(text);
@@ -54,10 +54,10 @@ void ManifestSections::reset(const uint8_t* text, size_t size) {
   patience_ = kLittleText;
 }
 
-// Sorting a section drops repeated names. It is sorted again only after the text has advanced by
-// the length of each of its names and kTwoAttributes more, the text of two short attributes.
-// Repeated names therefore take no more memory than others, and long names are not compared for
-// every few bytes read.
+// Sorting a section drops repeated names. The section is sorted again only after the text has
+// advanced by kLittleText plus, for each name, the name's length and kTwoAttributes. kTwoAttributes
+// is the length of the text of two short attributes. Repeated names therefore take no more memory
+// than others, and long names are not compared again after every few bytes.
 void ManifestSections::add(const ManifestAttribute& attribute) {
   constexpr size_t kTwoAttributes = 10;
   attributes_.push_back(attribute);

@@ -45,8 +45,8 @@ class ElementIterator {
   size_t index_;
 };
 
-// Attribute values by name, in byte order of the names: an ordered map. Of equal names the last one
-// in the text counts. Names and values are never empty.
+// An ordered map from the names of attributes to their values, in byte order of the names. If names
+// are equal, the last one in the text counts. Names and values are never empty.
 class ManifestSection {
  public:
   // Name and value.
@@ -62,7 +62,8 @@ class ManifestSection {
 
   // The value of the attribute of this name; empty if the section does not have it.
   std::string_view find(std::string_view name) const;
-  // The last attribute, in order, whose name ends in `suffix`; two empty texts if no name does.
+  // The last attribute, in byte order, whose name ends in `suffix`; two empty texts if no name ends
+  // in it.
   value_type findLastEndingIn(std::string_view suffix) const;
 
  private:
@@ -81,11 +82,11 @@ class ManifestSections {
   ElementIterator<ManifestSections> begin() const { return {this, 0}; }
   ElementIterator<ManifestSections> end() const { return {this, size()}; }
 
-  // The parser fills the table with the three functions below. reset removes all sections. The
-  // attributes that are added after it are pieces of the `size` bytes at `text`.
+  // The parser fills the table with the three functions below. reset removes all sections.
+  // Attributes that are added afterwards must be pieces of the `size` bytes at `text`.
   void reset(const uint8_t* text, size_t size);
-  // Adds an attribute to the open section. Its name and its value are not empty. A repeated name
-  // takes memory only until the section is sorted the next time.
+  // Adds an attribute to the open section. Its name and its value must not be empty. A repeated
+  // name takes memory only until the section is sorted the next time.
   void add(const ManifestAttribute& attribute);
   // Ends the open section, which may be empty. Only ended sections are visible.
   void endSection();

@@ -1,5 +1,5 @@
-// Finds a package's native libraries on disk: maps the ABI directories of the archive to the
-// directories beside the package that the installer extracts them to. Keeps no state, logs nothing.
+// Finds a package's native libraries on disk. Maps each ABI directory in the archive to the
+// directory beside the package to which the installer extracts it. Keeps no state and logs nothing.
 #pragma once
 
 #include <string>
@@ -12,9 +12,10 @@ struct LibraryDirectory {
   const char* installed;          // where the installer puts those libraries, beside the package
 };
 
-// The first row whose prefix matches wins. Longer names therefore come before "lib/armeabi", which
-// is a prefix of two of them.
-// Deliberate: "lib/armeabi-v8a" is in no usual list of ABIs. Packages that have it mean 64-bit Arm.
+// The first row whose prefix matches wins. The row "lib/armeabi" is therefore the last: its prefix
+// also matches the names of two other rows.
+// Deliberate: "lib/armeabi-v8a" is not a standard ABI directory. Packages that use it mean 64-bit
+// Arm.
 inline constexpr LibraryDirectory kLibraryDirectories[] = {
     {"lib/armeabi-v7a", "lib/arm"},
     {"lib/armeabi-v8a", "lib/arm64"},
@@ -22,14 +23,14 @@ inline constexpr LibraryDirectory kLibraryDirectories[] = {
     {"lib/armeabi", "lib/arm"},
 };
 
-// The path on disk of the library `entry_name` of the package at `package_path`: beside the
+// The path on disk of the library `entry_name` of the package at `package_path`. It is beside the
 // package, or relative to the working directory if `package_path` has no "/". Empty if no row of
 // the table matches.
 inline std::string InstalledLibraryPath(const std::string& package_path,
                                         const std::string& entry_name) {
   for (const LibraryDirectory& row : kLibraryDirectories) {
-    // Deliberate: prefixes need not end at a "/". "lib/armeabiX/a.so" is looked for in "lib/armX/".
-    // The digest check that follows decides all the same.
+    // Deliberate: prefixes need not end at a "/". For example, "lib/armeabiX/a.so" is looked for in
+    // "lib/armX/". The digest check afterwards still decides whether the file is signed.
     if (entry_name.compare(0, row.entry_prefix.size(), row.entry_prefix) != 0) continue;
     const size_t slash = package_path.rfind('/');
     const auto directory = package_path.substr(0, slash == std::string::npos ? 0 : slash + 1);

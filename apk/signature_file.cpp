@@ -92,7 +92,7 @@ bool Apk::VerifyCertificate(std::vector<uint8_t>& block, std::vector<uint8_t>& s
     return false;
   }
   // Deliberate: longer keys never verify above, so no test reaches this line. The guard protects
-  // the code that uses the key and has no room for a longer one.
+  // the code that uses the key, which has no space for a longer key.
   if (record.modulus_length > kLongestKey) return false;
   key.assign(record.modulus, record.modulus + record.modulus_length);
   return true;
@@ -120,8 +120,8 @@ bool Apk::ValidateManifest(const std::vector<uint8_t>& manifest) {
 bool Apk::VerifyData(const std::string& digest_name, const std::vector<uint8_t>& expected,
                      const std::vector<uint8_t>& data) {
   // Deliberate: only these two digests are supported. Every manifest that a package's signing tool
-  // wrote has one of them. Others (MD5, SHA-512) are refused. Signatures have another rule: old
-  // packages have signatures over MD5, and these verify.
+  // wrote has one of them. Others (MD5, SHA-512) are refused. The rule for signatures is different:
+  // old packages have signatures over MD5 digests, and these signatures verify.
   std::vector<uint8_t> computed;
   if (digest_name == "SHA1-Digest") {
     ComputeSHA1Digest(data, computed);
@@ -146,8 +146,9 @@ bool FitsInBlock(const std::vector<uint8_t>& block, const uint8_t* start, size_t
 // extends beyond the block or its exponent is 1 or -1.
 int LoadKey(const std::vector<uint8_t>& block, const pkcs7& record, rsa_context& key) {
   if (!FitsInBlock(block, record.modulus, record.modulus_length)) return kRsaBadInput;
-  // Deliberate: four bytes in host byte order, although certificates have the high byte first. That
-  // is right for the exponents that signing tools make: they have one byte or are 65537.
+  // Deliberate: the four bytes are read in host byte order, although certificates store the high
+  // byte first. The result is right for an exponent of one byte and for 65537. Signing tools use no
+  // other exponents.
   uint32_t exponent;
   memcpy(&exponent, record.exponent, sizeof(exponent));
   if (rsa_is_forgeable(exponent)) return kRsaBadInput;

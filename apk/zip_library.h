@@ -1,8 +1,8 @@
-// The platform's zip library, as the package model uses it.
+// The functions of the platform's zip library that the tool calls, in one form for all releases.
 //
-// The library has two generations: up to API 29 it takes names as `ZipString`, later as
-// std::string_view. Only this file sees the difference. The library owns archives, entries and
-// cookies. All results are its codes (0: success). Nothing is logged.
+// The library has two generations. Its functions accept names as `ZipString` up to API 29, and as
+// std::string_view later. Only this file depends on the difference. The library owns archives,
+// entries and cookies. All results are the library's codes (0: success). Nothing is logged.
 #pragma once
 
 #include <ziparchive/zip_archive.h>
@@ -11,7 +11,7 @@
 #include <string>
 #include <string_view>
 
-struct ZipString;  // Defined by the older generation alone.
+struct ZipString;  // Only the older generation defines it.
 
 namespace ApkTools {
 
@@ -19,7 +19,7 @@ namespace ApkTools {
 inline constexpr int32_t kZipEntryNotFound = -7;
 inline constexpr int32_t kZipInvalidEntryName = -10;
 
-// The longest name that a zip archive, and a `ZipString`, can hold, in bytes.
+// The length in bytes of the longest name that a zip archive and a `ZipString` can have.
 inline constexpr size_t kZipLongestName = 0xffff;
 
 // The type of a name in the installed library. The first overload exists only if FindEntry takes a
@@ -30,7 +30,8 @@ auto ZipNameFor(Entry* entry)
 ZipString ZipNameFor(...);
 using ZipName = decltype(ZipNameFor(static_cast<ZipEntry*>(nullptr)));
 
-// The templates below are for `ZipString` or a look-alike of it. The names point into the texts.
+// The templates below are for `ZipString`, or for a test's type with the same fields. A name points
+// into its text.
 
 inline void SetZipName(std::string_view& name, const std::string& text) { name = text; }
 // Sets the fields one by one: the constructor from a C string would stop at a NUL and abort on a
@@ -47,14 +48,14 @@ std::string_view ZipNameText(const Name& name) {
   return {reinterpret_cast<const char*>(name.name), name.name_length};
 }
 
-// A filter of names. The older generation takes a null pointer for an empty filter.
+// A filter of names. In the older generation, a null pointer is the empty filter.
 inline std::string_view ZipFilter(std::string_view name) { return name; }
 template <typename Name>
 const Name* ZipFilter(const Name& name) {
   return name.name_length == 0 ? nullptr : &name;
 }
 
-// Finds the entry of this name, which may hold any bytes.
+// Finds the entry of this name. The name may contain any bytes.
 inline int32_t FindZipEntry(ZipArchiveHandle archive, const std::string& text, ZipEntry* entry) {
   if (text.size() > kZipLongestName) return kZipInvalidEntryName;
   ZipName name;
@@ -62,8 +63,8 @@ inline int32_t FindZipEntry(ZipArchiveHandle archive, const std::string& text, Z
   return FindEntry(archive, name, entry);
 }
 
-// Starts a walk over the entries whose names begin with `prefix` and end with `suffix`; an empty
-// text filters nothing.
+// Starts an iteration over the entries whose names begin with `prefix` and end with `suffix`. An
+// empty text matches every name.
 inline int32_t StartZipIteration(ZipArchiveHandle archive, void** cookie, const std::string& prefix,
                                  const std::string& suffix) {
   if (prefix.size() > kZipLongestName || suffix.size() > kZipLongestName) {

@@ -15,8 +15,9 @@ namespace ApkTools {
 
 namespace {
 
-// How a line that the tool's code logs begins, and what it says of the package. Each refusal logs
-// at most one of these, or the same one twice, after the parser's line: the last one is the reason.
+// The starts of the lines that the tool's code logs for a refusal, and the reason that each line
+// gives. After the parser's line, a refusal logs at most one of the other lines, or the same line
+// twice. The last line therefore gives the reason.
 constexpr struct LoggedReason {
   const char* start;
   Reason reason;
@@ -36,7 +37,7 @@ constexpr struct LoggedReason {
     {"Integrity not confirmed: classes.dex\n", Reason::kDexRefused},
 };
 
-// Of the verification that this thread is at, or null.
+// The reason of the verification that runs in this thread, or null.
 thread_local Reason* heard = nullptr;
 
 Reason ReasonOf(Apk& apk, Reason logged);
@@ -100,8 +101,9 @@ const char* TextOf(Reason reason) {
 
 namespace {
 
-// Two kinds are told apart by what is in the archive: the manifest that is missing, of which one
-// line is logged as of one that cannot be extracted, and the signature's files, of which none is.
+// The log does not distinguish all cases, so the archive's entries are checked. The same line is
+// logged if "AndroidManifest.xml" is missing and if it cannot be extracted. No line is logged if
+// the manifest or the signature file is missing or cannot be extracted.
 Reason ReasonOf(Apk& apk, Reason logged) {
   if (logged == Reason::kAndroidManifestUnreadable) {
     return HasEntry(apk, "AndroidManifest.xml", "") ? logged : Reason::kNoPackage;
@@ -111,8 +113,8 @@ Reason ReasonOf(Apk& apk, Reason logged) {
   return is_signed ? Reason::kSignatureUnreadable : Reason::kUnsigned;
 }
 
-// True if there is an entry of the name `prefix` or, if `suffix` is not empty, of a name that
-// begins and ends so.
+// If `suffix` is empty, true if there is an entry with the name `prefix`. Otherwise, true if the
+// name of an entry begins with `prefix` and ends with `suffix`.
 bool HasEntry(Apk& apk, const std::string& prefix, const std::string& suffix) {
   void* cookie;
   if (apk.StartIteration(&cookie, prefix, suffix) != 0) return false;
@@ -144,8 +146,8 @@ void Hear(std::string_view text) {
 
 }  // namespace ApkTools
 
-// The program's definition comes before the platform's, for the platform's libraries as well. A
-// text that is longer than a record of the log is cut at the same place as in the log.
+// This definition replaces the platform's in the whole program, also for calls from the platform's
+// libraries. A text that is longer than a log record is cut at the same place as in the log.
 extern "C" int __android_log_print(int priority, const char* tag, const char* format, ...) {
   va_list arguments;
   va_start(arguments, format);

@@ -1,10 +1,11 @@
-// For programs that link the verification: one package, why it is refused, and its archive
-// released.
+// The verification for programs that link it: verifies one package, gives the reason for a refusal,
+// and releases the archive.
 //
-// The tool's own code decides. It says why in the Android log alone, so the lines that it logs
-// while it works are read here, and go on to the log as they are. For that this library defines
-// __android_log_print, for the whole program. It is made for programs: in a shared library the call
-// may reach the platform's function instead, and refusals are then kUnknown.
+// The tool's own code decides, and reports the reason only in the Android log. This library
+// therefore reads each line that the code logs, and passes the line on to the log unchanged. To
+// read the lines, it defines __android_log_print for the whole program. Link this library into
+// programs only. In a shared library, the call may reach the platform's function instead, and the
+// reasons for refusals are then wrong or kUnknown.
 #pragma once
 
 #include <optional>
@@ -17,29 +18,29 @@ namespace ApkTools {
 enum class Reason {
   kGood,
   kNoDescriptor,               // there is no file: the descriptor is negative
-  kNoArchive,                  // the zip library cannot open it
-  kNoPackage,                  // an archive without "AndroidManifest.xml": a JAR, or any other
-  kAndroidManifestUnreadable,  // that entry cannot be extracted
+  kNoArchive,                  // the zip library cannot open the file
+  kNoPackage,                  // the archive has no "AndroidManifest.xml"; it may be a JAR
+  kAndroidManifestUnreadable,  // "AndroidManifest.xml" cannot be extracted
   kUnsigned,                   // no "META-INF/MANIFEST.MF", or no signature file "META-INF/*.SF"
-  kSignatureUnreadable,        // both are there, and one of them cannot be extracted
+  kSignatureUnreadable,        // the manifest or the signature file cannot be extracted
   kSignatureFileMalformed,     // the signature file does not parse
-  kNoRsaBlock,                 // its block "*.RSA" is missing, or cannot be extracted
+  kNoRsaBlock,                 // the signature block "*.RSA" is missing, or cannot be extracted
   kBlockMalformed,             // the block does not parse, or its key is not RSA
   kKeyRefused,                 // the key is cut off, or has the exponent 1 or -1
-  kCertificateRefused,         // the certificate is not signed with its own key, or by SHA-384 etc.
+  kCertificateRefused,         // the certificate is not self-signed, or its digest is SHA-384 etc.
   kSignatureRefused,           // the block's signature does not cover the signature file
-  kManifestRefused,            // the signature file has no digest of the manifest, or another one
+  kManifestRefused,            // the signature file has no digest of the manifest, or a wrong one
   kManifestMalformed,          // the manifest does not parse
   kAndroidManifestMalformed,   // "AndroidManifest.xml" is not compiled XML
   kDexRefused,                 // "classes.dex" is not what the manifest lists
-  kUnknown,                    // it is refused, and no line that was logged is known
+  kUnknown,                    // the file is refused, and no logged line gives a known reason
 };
 
 // The reason as the end of a sentence such as "refused: …", in English. The text is static.
 const char* TextOf(Reason reason);
 
-// A package that was opened and verified. Its end releases the archive: its mapping, and its
-// memory.
+// A package that was opened and verified. The destructor releases the archive, with its mapping and
+// its memory.
 class Verification {
  public:
   // `fd`: the file, open for reading. The caller keeps it open for the life of the object, and
@@ -51,7 +52,7 @@ class Verification {
 
   // kGood if and only if the package's IsGoodApk() is true.
   Reason reason() const { return reason_; }
-  // The facts that were found: package name, signer's key, entries. Never null, and gone with this
+  // The facts that were found: package name, signer's key, entries. Valid for the life of this
   // object.
   Apk& apk() { return *apk_; }
 

@@ -16,8 +16,8 @@ constexpr useconds_t kPollMicroseconds = 10000;
 constexpr size_t kPathSize = 256;
 
 bool MaySign(uint32_t integrity) {
-  // Deliberate: a waiting read never ends with the value "not settled". The test refuses that value
-  // all the same, together with 0, so that no change to the reader can let it through.
+  // Deliberate: a read that waits never returns the value "not settled". This check refuses that
+  // value nevertheless, so that a change to the reader cannot let it through.
   return integrity != 0 && integrity != kNotSettled;
 }
 
@@ -54,8 +54,8 @@ uint32_t VeltTaskReadIntegrity(int pid, uint32_t wait, uint32_t* value) {
   char path[kPathSize] = {};
   if (value == nullptr || !FormatIntegrityPath(pid, path)) return kVeltFailure;
   const bool waits = (wait & 1) != 0;
-  // Deliberate: the repetitions have no limit. The kernel settles every task's value in the end,
-  // and giving up earlier would leave the file unsigned for good.
+  // Deliberate: the number of repetitions has no limit. The kernel settles the value of every task
+  // at some time. A limit that ends the wait earlier would leave the file unsigned permanently.
   while (ReadHexadecimal(path, value)) {
     if (!waits || *value != kNotSettled) return 0;
     usleep(kPollMicroseconds);

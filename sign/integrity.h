@@ -1,6 +1,6 @@
 // The kernel's file-integrity feature (VELT): two private fcntl commands, and the integrity value
 // that the kernel publishes for each task under /proc. C linkage. The functions log nothing and
-// leave errno as the last system call set it. They keep no state: any thread may call.
+// leave errno as the last system call set it. They keep no state, and any thread may call them.
 //
 // All three return 0 for success and kVeltFailure for every failure.
 #pragma once
@@ -14,22 +14,23 @@ extern "C" {
 
 // Asks the kernel to sign the open file `fd`.
 //
-// `payload` is borrowed for the call: an unsigned 16-bit length L in host byte order, then L bytes.
-// L may be 0. Fails without calling the kernel if `payload` is null, or if the calling task's own
-// integrity value cannot be read or is 0: a task with 0 may not sign. Waits, without a limit, while
-// that value is not settled yet. If the kernel refuses, errno is the kernel's.
+// `payload` is an unsigned 16-bit length L in host byte order, then L bytes. L may be 0. The
+// function keeps no pointer to `payload`. It fails without a request to the kernel if `payload` is
+// null, or if the integrity value of the calling task cannot be read or is 0. A task with the value
+// 0 must not sign. The function waits without a limit while the value is not settled yet. If the
+// kernel refuses, errno is the kernel's error number.
 uint32_t VeltSignFd(int fd, const void* payload);
 
 // Asks the kernel whether it trusts the open file `fd`. The caller's own integrity value does not
-// matter. If the kernel refuses, errno is the kernel's.
+// matter. If the kernel refuses, errno is the kernel's error number.
 uint32_t VeltVerifyFd(int fd);
 
 // Reads the integrity value of the task with process id `pid` (0: the calling task) into `*value`.
 //
-// With bit 0 of `wait` set, reads again every 10 ms while the value is 0xFFFFFFFF (not settled
-// yet); `*value` then holds each value in turn. Fails if `value` is null, if `pid` is negative, or
-// if the task's file cannot be opened or does not hold a hexadecimal number; `*value` then keeps
-// its former value, or the last value read while waiting.
+// If bit 0 of `wait` is set, reads again every 10 ms while the value is 0xFFFFFFFF (not settled
+// yet), and stores each value in `*value`. Fails if `value` is null, if `pid` is negative, or if
+// the task's file cannot be opened or does not contain a hexadecimal number. After a failure,
+// `*value` has its former value, or the last value that was read while waiting.
 uint32_t VeltTaskReadIntegrity(int pid, uint32_t wait, uint32_t* value);
 
 }  // extern "C"

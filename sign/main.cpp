@@ -1,6 +1,6 @@
-// One file, three steps: sign its native libraries, sign the file itself, register its signer. The
-// tool prints nothing here. The exit status is 1 for a usage error and 0 for everything else. Only
-// the Android log tells what was signed and what was refused.
+// Runs three steps on one file: signs its native libraries, signs the file itself, and registers
+// its signer. main prints nothing. The exit status is 1 for a usage error and 0 for everything
+// else. Only the Android log reports what was signed and what was refused.
 #include <sys/statvfs.h>
 #include <unistd.h>
 
@@ -23,14 +23,14 @@ int main(int argc, char* argv[]) {
   if (argc != 2) return 1;
   // Deliberate: does not wait for a FIFO's writer. A FIFO is not an archive.
   const int fd = OpenForReading(argv[1], 0);
-  // Deliberate: descriptor 0 is refused like a failed open. A caller that closed standard input did
-  // not set this process up as the install path does. On a read-only file system nothing can be
-  // signed, and the tool ends without an error. The process exit closes the descriptor.
+  // Deliberate: descriptor 0 is refused like a failed open. It means that the caller closed
+  // standard input, which the install path never does. Nothing can be signed on a read-only file
+  // system, so the tool ends without an error. The end of the process closes the descriptor.
   if (fd < 1 || IsOnReadOnlyFileSystem(fd)) return 0;
 
   ApkTools::Apk apk(fd);
-  // Deliberate: the results are ignored. Each step asks the package itself whether it may go on,
-  // and a failed step does not make the tool skip the next.
+  // Deliberate: the results are ignored. Each step itself checks the file, and a failed step does
+  // not stop the next step.
   VeltSignJni(apk, fd, argv[1]);
   VeltSign(apk, fd, fd);
   ZuSign(apk, fd, fd);

@@ -41,7 +41,8 @@ void RegisterJar(int zip_fd, int fd) {
   ReportResult(ZuNewCertificate(fd, jar_path.c_str(), block.data(), block.size()));
 }
 
-// A file that is not a zip archive comes here, too. It asks for no permission, so nothing happens.
+// This function is also called for a file that is not a zip archive. The file asks for no
+// permission, so nothing happens.
 void RegisterPackage(ApkTools::Apk& apk, int fd) {
   if (!apk.IsSsPermissionRequired()) return;
   if (!apk.IsGoodApk()) {
@@ -53,10 +54,11 @@ void RegisterPackage(ApkTools::Apk& apk, int fd) {
   ReportResult(ZuNewCertificate(fd, apk.GetPackageName().c_str(), key.data(), key.size()));
 }
 
-// A JAR does not ask if the attribute is missing, empty or unreadable.
+// Returns false if the attribute is missing, empty or unreadable.
 bool AsksForRegistration(int jar_fd) { return fgetxattr(jar_fd, "user.zu", nullptr, 0) >= 1; }
 
-// 128 bytes: four SHA-256 digests. The first is of the path, each other of the digest before it.
+// Returns 128 bytes: four SHA-256 digests. The first is the digest of the path. Each other one is
+// the digest of the one before it.
 std::vector<uint8_t> JarKeyBlock(const std::string& path) {
   constexpr size_t kBlockSize = 128;
   std::vector<uint8_t> block;

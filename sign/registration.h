@@ -3,10 +3,11 @@
 
 #include "apk/apk.h"
 
-// Registers a certificate for `fd` through libzu if the file asks for it, and otherwise does
-// nothing and logs nothing. Borrows both descriptors. Returns nothing; the log tells the result.
+// Registers a certificate for `fd` through libzu if the file asks for a registration. Otherwise
+// does nothing and logs nothing. Both descriptors stay open. Only the log reports the result.
 //
-// A package asks by the secure-storage permission. If it verified, its signer's key is registered
-// under its package name. A plain JAR asks by a non-empty extended attribute "user.zu" on `zip_fd`.
-// Then 128 bytes are registered under its path: four chained SHA-256 digests, the first of it.
+// A package asks with the secure-storage permission. If the package verified, its signer's key is
+// registered under its package name. A plain JAR asks with a non-empty extended attribute "user.zu"
+// on `zip_fd`. 128 bytes are then registered under the JAR's path: four chained SHA-256 digests, of
+// which the first is the digest of the path.
 void ZuSign(ApkTools::Apk& apk, int zip_fd, int fd);

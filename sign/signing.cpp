@@ -42,7 +42,7 @@ uint32_t VeltSignJni(ApkTools::Apk& apk, int fd, const char* /*path*/) {
     LogError("VeltSignJni: malformed apk: %s\n", apk.GetPath().c_str());
     return kVeltFailure;
   }
-  // If the walk cannot start, the cookie stays null and Next delivers nothing.
+  // If the iteration cannot start, the cookie stays null and Next returns no entry.
   void* cookie = nullptr;
   apk.StartIteration(&cookie, "lib/", ".so");
   ZipEntry entry;
@@ -53,7 +53,7 @@ uint32_t VeltSignJni(ApkTools::Apk& apk, int fd, const char* /*path*/) {
     LogError("VeltSignJni: File not verified: %s\n", target.c_str());
   }
   apk.EndIteration(cookie);
-  // Deliberate: a refused library does not change the result. Its own message tells about it.
+  // Deliberate: a refused library does not change the result. The refusal has its own message.
   LogInfo("VeltSignJni finished: %u.\n", 0U);
   return 0;
 }
@@ -70,7 +70,7 @@ uint32_t SignAsPackage(ApkTools::Apk& apk, int fd) {
   if (!apk.IsGoodApk()) return kVeltFailure;
   std::vector<uint8_t> digest;
   ComputeSHA256Digest(apk.GetManufacturerKey(), digest);
-  // The payload must live until errno has been read.
+  // The payload must live until errno has been read, because freeing it may change errno.
   const std::vector<uint8_t> payload = SignPayload(digest);
   const uint32_t result = VeltSignFd(fd, payload.data());
   if (result != 0) {
@@ -82,12 +82,13 @@ uint32_t SignAsPackage(ApkTools::Apk& apk, int fd) {
 
 uint32_t SignAsJar(ApkTools::Apk& apk, int fd) {
   LogInfo("VeltSignOat: non-Apk (Jar) case\n");
-  // Deliberate: the kernel must already trust the file that was opened as the archive, not `fd`.
+  // Deliberate: the kernel must already trust the file that was opened as the archive. It need not
+  // trust `fd`.
   uint32_t result = VeltVerifyFd(apk.GetFd());
   if (result != 0) {
     const int error = errno;
-    // Deliberate: information, not an error. Most JARs on a device were never signed, and an
-    // untrusted one is the ordinary case.
+    // Deliberate: this is logged as information, not as an error. Most JARs on a device were never
+    // signed, so an untrusted JAR is the ordinary case.
     LogInfo("VELT can't verify a file %d: %s/%s.\n", error, apk.GetPackageName().c_str(),
             strerror(error));
     return result;
@@ -111,10 +112,11 @@ std::vector<uint8_t> SignPayload(const std::vector<uint8_t>& data) {
   return payload;
 }
 
-// Returns false if the file does not match the signed manifest. Logs every other failure here.
+// Returns false if the file does not match the signed manifest; the caller then logs the refusal.
+// After every other failure, logs it and returns true.
 bool SignLibrary(ApkTools::Apk& apk, const std::string& entry_name, const std::string& target) {
   // The digested file stays open, so that no other file can get its inode number meanwhile. Its
-  // descriptor is a high one, so that the file to sign gets the lowest free descriptor.
+  // descriptor has a high number, so that the file to sign gets the lowest free descriptor.
   constexpr int kFarDescriptor = 100;
   const ScopedFd kept(fcntl(ScopedFd(OpenForReading(target.c_str(), O_CLOEXEC)).get(),
                             F_DUPFD_CLOEXEC, kFarDescriptor));
@@ -129,10 +131,10 @@ bool SignLibrary(ApkTools::Apk& apk, const std::string& entry_name, const std::s
     LogError("Error %d: %s.\n", error, strerror(error));
     return true;
   }
-  // Deliberate: a file is signed only if fstat still gives the state that it had before its bytes
-  // were digested. An entry's name may lead into a directory that others can write to, so `target`
-  // may be another file by now. An exchanged or touched file is digested again, now through the
-  // descriptor that is signed (docs/decisions/the-file-that-was-read.md).
+  // Deliberate: a file is signed only if fstat still returns the state that the file had before its
+  // bytes were digested. An entry's name may lead into a directory that other programs can write
+  // to, so `target` may now be another file. An exchanged or touched file is digested again, this
+  // time through the descriptor that is signed (docs/decisions/the-file-that-was-read.md).
   constexpr int kMostDigests = 3;
   struct stat opened = {};
   fstat(library.get(), &opened);

@@ -1,7 +1,7 @@
-// Chooses the files that the kernel is asked to sign, and the payload: each extracted native
-// library whose bytes match the signed manifest, and the file itself. Results are the codes of
-// sign/integrity.h. Both functions log each step and each refusal. They borrow the package and the
-// descriptors.
+// Chooses the files that the tool asks the kernel to sign, and their payload. The files are each
+// extracted native library whose bytes match the signed manifest, and the package or JAR itself.
+// Results are the codes of sign/integrity.h. Both functions log each step and each refusal. They do
+// not close the descriptors.
 //
 // Payload of a package: a 16-bit length (32, host byte order) and the SHA-256 digest of the
 // signer's key. Payload of a plain JAR: the 16-bit length 0, no data.
@@ -17,6 +17,6 @@
 uint32_t VeltSign(ApkTools::Apk& apk, int zip_fd, int fd);
 
 // Signs the native libraries that were extracted beside the package `apk`. `fd` appears only in a
-// message; `path` is unused, because the package knows its path. Returns kVeltFailure for anything
-// but a good package, and otherwise 0, even if libraries could not be signed.
+// message; `path` is not used, because `apk` has the package's path. Returns 0 for a good package,
+// even if libraries could not be signed, and kVeltFailure for everything else.
 uint32_t VeltSignJni(ApkTools::Apk& apk, int fd, const char* path);

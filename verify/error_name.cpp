@@ -4,8 +4,8 @@
 
 namespace {
 
-// The names from error number 1 on, as Linux numbers them on Arm and x86. "-" stands for a number
-// without a name. If a number has two names, this is the kernel's.
+// The names of the error numbers from 1 on, as Linux numbers them on Arm and x86. "-" marks a
+// number without a name. If a number has two names, the list has the kernel's name.
 constexpr char kNames[] =
     "EPERM ENOENT ESRCH EINTR EIO ENXIO E2BIG ENOEXEC EBADF ECHILD EAGAIN ENOMEM EACCES EFAULT "
     "ENOTBLK EBUSY EEXIST EXDEV ENODEV ENOTDIR EISDIR EINVAL ENFILE EMFILE ENOTTY ETXTBSY EFBIG "

@@ -1,5 +1,6 @@
 // The names of error numbers, such as "ENOKEY" for 126. The C library of API level 27 has no
-// function for that. The function keeps no state, and its texts live as long as the process.
+// function that returns these names. ErrorName() keeps no state, and its texts live as long as the
+// process.
 #pragma once
 
 #include <string_view>

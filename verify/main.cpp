@@ -1,7 +1,7 @@
 // apktoolkit-verify asks the kernel whether it trusts each file, and prints one line per file. It
-// reads no bytes of a file and logs nothing: the answer is the kernel's alone. Exit status: 0 if
-// all files are trusted; 1 if a file is not trusted or cannot be opened; 2 if the command line is
-// wrong or the output cannot be written.
+// does not read the files and logs nothing: the kernel alone decides. Exit status: 0 if all files
+// are trusted; 1 if a file is not trusted or cannot be opened; 2 if the command line is wrong or
+// the output cannot be written.
 #include <fcntl.h>
 #include <sys/stat.h>
 #include <unistd.h>
@@ -41,7 +41,8 @@ int main(int argc, char* argv[]) {
 
 namespace {
 
-// True for at least one file and no options: the program has none, and takes none for a file.
+// True if there is at least one file and no option. The program has no options, and does not treat
+// an option as a file's name.
 bool IsCommandLineRight(int argc, char* argv[]) {
   for (int i = 1; i < argc; ++i) {
     if (argv[i][0] == '-') return false;
@@ -62,8 +63,8 @@ bool IsTrusted(const char* path) {
   return is_trusted;
 }
 
-// The kernel fixes the bytes of regular files only. Its answer for other files means nothing, so it
-// is not asked.
+// The kernel protects the bytes of regular files only. The kernel's answer for other files means
+// nothing, so the program does not request it.
 bool AskKernel(int fd) {
   struct stat state = {};
   if (fstat(fd, &state) != 0 || !S_ISREG(state.st_mode)) {
@@ -78,8 +79,8 @@ bool AskKernel(int fd) {
   return true;
 }
 
-// A path may hold any byte but NUL. Control characters and the backslash are printed as \xHH, so
-// that a path cannot end the line or command a terminal.
+// A path may contain any byte except NUL. Control characters and the backslash are printed as \xHH,
+// so that a path cannot end the line or control a terminal.
 void PrintPath(const char* path) {
   for (; *path != '\0'; ++path) {
     const auto byte = static_cast<unsigned char>(*path);
