@@ -1,5 +1,5 @@
-// Reads every *.mf file of a directory with the JDK's own parser. Writes the parsed manifest to
-// *.dump, and the manifest itself, written anew, to *.rewritten. The dump has a line "Section
+// Reads every *.mf file of a directory with the JDK's own parser. Writes the parsed contents to
+// *.dump, and the manifest as the JDK writes it to *.rewritten. The dump has a line "Section
 // <name>" per section (the main section first, without a name) and a line "<attribute>: <value>"
 // per attribute, in order.
 import java.io.FileInputStream;

@@ -227,7 +227,8 @@ TEST(AndroidManifestAttribute, AStringWithoutTextIsPassedOverForALaterString) {
             (Facts{"b", false}));
 }
 
-// The raw value is the text in the source. The typed value, to which it was compiled, counts.
+// The raw value is the text in the source. The typed value, which was compiled from that text,
+// counts.
 TEST(AndroidManifestAttribute, AnAttributeOfAnotherTypeIsMissingEvenWithARawText) {
   for (XmlAttribute attribute :
        {ReferenceAttribute("package", 0x7f010000), IntAttribute("package", 7)}) {
@@ -249,10 +250,8 @@ TEST(AndroidManifestAttribute, ALoneStringWithoutTextIsMissing) {
             (Facts{"", false}));
 }
 
-// ---- Malformed documents.
-
-// ---- Unpaired surrogates. The platform drops them when it converts a text to UTF-8. Here names
-// and values are not converted, but compared as if they were.
+// ---- Unpaired surrogates. The platform drops them when it converts a text to UTF-8. The tool does
+// not convert names and values, but compares them as if they were converted.
 
 const std::string kHigh = "\xED\xA0\x80", kLow = "\xED\xB0\x80";  // U+D800, U+DC00
 
@@ -293,7 +292,7 @@ TEST(AndroidManifestSurrogates, AShorterNameDoesNotMatchWithAnyNumberOfThem) {
   EXPECT_EQ(Read(xml), (Facts{"", false}));
 }
 
-// Without this limit, a hostile document could make each comparison as long as itself.
+// Without this limit, each comparison could read as much text as a hostile document has.
 TEST(AndroidManifestSurrogates, MoreThanSixteenMakeAnotherName) {
   for (const size_t count : {16, 17}) {
     CompiledXml xml(CompiledXml::Pool::kUtf16);
@@ -313,6 +312,8 @@ TEST(AndroidManifestSurrogates, APackageNameLosesAnyNumberOfThem) {
   xml.Element("manifest", {Package(Times(40, kHigh) + "a" + Times(40, kLow))});
   EXPECT_EQ(Read(xml), (Facts{"a", false}));
 }
+
+// ---- Malformed documents.
 
 TEST(AndroidManifestDocument, BytesThatAreNotCompiledXmlFail) {
   LogCapture log;
@@ -377,7 +378,7 @@ TEST(AndroidManifestDocument, OneThatIsCutShortAnywhereIsReadOrRefusedWithoutHar
   EXPECT_LT(read, whole.size());
 }
 
-// Replaces these bytes, which the document has in one place only.
+// Replaces these bytes, which must occur once in the document.
 Bytes Replaced(Bytes document, const Bytes& old_bytes, const Bytes& new_bytes) {
   const auto at = std::search(document.begin(), document.end(), old_bytes.begin(), old_bytes.end());
   EXPECT_NE(at, document.end());
@@ -385,7 +386,7 @@ Bytes Replaced(Bytes document, const Bytes& old_bytes, const Bytes& new_bytes) {
   return document;
 }
 
-// The platform's library then returns no text for the name, but a length.
+// For such a name, the platform's library returns a length but no text.
 TEST(AndroidManifestDocument, AnElementWhoseNameDoesNotEndIsPassedOver) {
   CompiledXml xml;
   xml.Element("manifest", {Package("a")}).Element("permission", {AndroidName(kPermission)});

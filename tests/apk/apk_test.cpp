@@ -1,4 +1,4 @@
-// Init: the flags that say how far it got, and the steps that verify a package.
+// Tests Init: the flags that it sets, and the steps that verify a package.
 #include "apk/apk.h"
 
 #include <fcntl.h>
@@ -46,7 +46,7 @@ PackageOptions WithoutDexListedBy(const std::string& text) {
   return options;
 }
 
-// ---- The flags after Init: one test for each step that it can reach.
+// ---- The flags after Init: one test for each step that Init can reach.
 
 TEST(ApkInit, WithoutDescriptorAndPathAllFlagsAreFalse) {
   LogCapture log;
@@ -179,7 +179,7 @@ TEST(ApkInit, DescriptorOneFromItsOwnOpenIsUsed) {
   EXPECT_TRUE(apk.IsGoodZip());
 }
 
-// The caller knows what descriptor 0 is if it passes descriptor 0.
+// A caller that passes descriptor 0 knows which file it is.
 TEST(ApkInit, DescriptorZeroThatWasGivenIsUsed) {
   DiskFile file(MakePackage(WithoutDex()).Build());
   LogCapture log;
@@ -292,7 +292,8 @@ TEST(ApkInit, APackageWithoutManifestIsNotGoodAndLogsNothing) {
   EXPECT_EQ(StateOf(open.apk), (State{true, true, false, true}));
 }
 
-// The manifest is read before the signature file and its block. Nothing is logged about these then.
+// The manifest is read first. If it is missing, nothing is logged about the signature file and its
+// block.
 TEST(ApkInit, APackageWithoutManifestAndBlockLogsNothing) {
   Package package = MakePackage(WithoutDex());
   package.Remove(kManifestName);

@@ -75,7 +75,7 @@ TEST(EntryDigests, OfEqualNamesTheLaterSectionCountsInAnyOrder) {
   EXPECT_EQ("SHA-256-Digest 3", unordered.Of("b"));
 }
 
-// A sort that is not stable may still keep a few equal names in order. It does not keep this many.
+// A sort that is not stable may keep a few equal names in order by chance, but not so many.
 TEST(EntryDigests, OfManyEqualNamesTheLastSectionCounts) {
   std::string sections = Section("z", "0");
   for (int i = 1; i <= 100; ++i) sections += Section(i % 2 == 0 ? "a" : "b", std::to_string(i));
@@ -87,17 +87,18 @@ TEST(EntryDigests, OfManyEqualNamesTheLastSectionCounts) {
 
 // The hash of a name is rotated by 9 bits before each byte. 64 rotations are 576 bits, 9 full turns
 // of the 64-bit hash. Bytes at a distance of 64 therefore enter the hash at the same place, and
-// their order does not change it.
+// their order does not change the hash.
 std::string With64Between(const std::string& letters) {
   std::string name;
   for (const char letter : letters) name += letter + std::string(63, '/');
   return name;
 }
 
-// In the first family, all names share a hash. In the second, the three long names do. In the
-// third, two pairs do: the two names of 8 letters and the two long names. The first of 8 letters is
-// rotated by 63 bits to the left, which is one bit to the right. "b" becomes 0x31, and 0x31 ^ "q"
-// (0x71) is 0x40. "d" becomes 0x32, and 0x32 ^ "r" (0x72) is 0x40, too.
+// In the first family, all names have the same hash. In the second, the three long names have the
+// same hash. In the third, the two names of 8 characters have the same hash, and the two long names
+// have the same hash. The first of 8 characters is rotated by 63 bits to the left, which equals one
+// bit to the right. "b" becomes 0x31, and 0x31 ^ "q" (0x71) is 0x40. "d" becomes 0x32, and 0x32 ^
+// "r" (0x72) is also 0x40.
 TEST(EntryDigests, NamesWithEqualHashesAreDistinguished) {
   const std::vector<std::string> families[] = {
       {With64Between("abc"), With64Between("acb"), With64Between("bac"), With64Between("bca"),
@@ -189,8 +190,8 @@ TEST(EntryDigests, LoadingAnotherManifestForgetsTheFirst) {
   }
 }
 
-// The same for every pair of these manifests. Some have sorted names, some have unsorted names, and
-// the last does not parse.
+// Loads every pair of these manifests, one after the other. Some have sorted names, some have
+// unsorted names, and the last does not parse.
 TEST(EntryDigests, NothingOfAnEarlierManifestSurvives) {
   const std::string manifests[] = {
       "",
@@ -217,8 +218,8 @@ TEST(EntryDigests, NothingOfAnEarlierManifestSurvives) {
   }
 }
 
-// The third section is still in memory: after the end of the text, and in the table's former
-// contents. It must not be listed.
+// The third section is still in memory, after the end of the text and in the former contents of the
+// table. It must not be listed.
 TEST(EntryDigests, NoMoreSectionsAreListedThanThereAre) {
   const std::string two = Section("a", "1") + Section("b", "2");
   const std::string whole = two + Section("c", "3");

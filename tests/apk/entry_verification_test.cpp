@@ -1,4 +1,4 @@
-// Comparing single entries and files with the digests that the manifest records.
+// Tests how single entries and files are compared with the digests that the manifest records.
 #include <gtest/gtest.h>
 #include <sys/stat.h>
 #include <unistd.h>
@@ -13,7 +13,8 @@
 
 using ApkTools::Apk;
 
-// The linker sends the tool's calls of read here, also those of a build with _FORTIFY_SOURCE.
+// The linker redirects the tool's calls of read to the functions below, also in a build with
+// _FORTIFY_SOURCE.
 static std::function<void()> before_read;
 
 extern "C" ssize_t __real_read(int fd, void* buffer, size_t size);
@@ -129,7 +130,7 @@ TEST(IsGoodApk, ADexThatIsThereButCannotBeFoundIsBad) {
   EXPECT_EQ(log.records(), Records({Error(kDexFailed)}));
 }
 
-// The package is good except for the length that its "classes.dex" then claims.
+// `package` must be good. It must become bad if its "classes.dex" declares an impossible length.
 void ExpectImpossibleLengthToBeBad(Package package) {
   ASSERT_TRUE(OpenPackage(package).apk.IsGoodApk());
   ZipItem& dex = package.Item("classes.dex");
@@ -311,7 +312,7 @@ TEST(VerifyFileHash, AFileThatCannotBeReadIsReportedWithAnyDigest) {
   }
 }
 
-// The missing bytes count as zeros, even if the buffer held another file's bytes there.
+// The missing bytes count as zeros, even if the buffer contained bytes of another file before.
 TEST(VerifyFileHash, AFileThatShrinksMeanwhileEndsInZeros) {
   PackageOptions options;
   options.entries = {{"first", ToBytes("the first file")},

@@ -1,4 +1,4 @@
-// Checking an entry's lengths before memory is allocated for it.
+// Tests the checks of an entry's lengths before memory is allocated for the entry.
 #include "apk/extraction.h"
 
 #include <gtest/gtest.h>
@@ -10,8 +10,8 @@
 
 using namespace ApkTools;
 
-// The linker sends the tool's calls of mmap here, also the one by which it asks if memory can be
-// had.
+// The linker redirects the tool's calls of mmap to the function below, also the call that checks
+// whether memory is available.
 static bool memory_is_short = false;
 
 extern "C" void* __real_mmap(void* address, size_t size, int protection, int flags, int fd,
@@ -42,7 +42,7 @@ TEST(Extraction, AnEmptyEntryIsExtracted) {
   }
 }
 
-// 258 bytes for every two bits: zeros come closest to deflate's limit.
+// Deflate encodes 258 zeros in two bits, so zeros come closest to its limit.
 TEST(Extraction, TheBestDeflatedDataIsPlausible) {
   const Bytes zeros(10 << 20, 0);
   OpenEntry zip({"a", zeros, true});

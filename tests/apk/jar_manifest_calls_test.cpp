@@ -1,5 +1,6 @@
-// Counts calls of the C and the C++ library by the readers of a JAR's manifest: comparisons and
-// copies, which results do not show. The linker sends the calls of the whole program here.
+// Counts the comparisons of the readers of a JAR manifest, and changes the direction of their
+// copies, because results show neither. The linker redirects the calls of the whole program to the
+// functions below.
 #include <gtest/gtest.h>
 
 #include <algorithm>
@@ -16,7 +17,8 @@
 namespace {
 
 size_t comparisons = 0;
-// Copies begin at the last byte. memcpy may do so, because its pieces do not overlap.
+// True: copies begin at the last byte. memcpy may begin there, because its source and its target do
+// not overlap.
 bool copies_backwards = false;
 
 }  // namespace
@@ -66,8 +68,8 @@ std::vector<std::string> ShortNames(size_t count) {
   return names;
 }
 
-// A sort compares each name with about log2(count) others. Sorting again only after enough new
-// names at most doubles the comparisons. This test allows twice as many.
+// A sort compares each name with about log2(count) others. The section is sorted again only after
+// enough new names, which at most doubles the comparisons. This test allows twice that number.
 TEST_F(JarManifestCalls, DistinctShortNamesAreSortedInLogarithmicTime) {
   std::vector<std::string> names = ShortNames(4096);
   std::shuffle(names.begin(), names.end(), std::mt19937(1));
@@ -82,7 +84,7 @@ TEST_F(JarManifestCalls, NamesInOrderAreComparedWithTheirNeighboursAlone) {
   EXPECT_LT(count, 4 * 4096u);
 }
 
-// A few names that repeat are sorted each time after as much text as they take.
+// A few repeated names are sorted again only after the text has advanced by their total length.
 TEST_F(JarManifestCalls, NamesThatRepeatAreComparedInLogarithmicTime) {
   std::vector<std::string> names;
   for (int round = 0; round < 64; ++round) {
@@ -91,10 +93,10 @@ TEST_F(JarManifestCalls, NamesThatRepeatAreComparedInLogarithmicTime) {
   EXPECT_LT(ComparisonsOf(names), 4 * 12u * 4096);
 }
 
-// The text before it does not matter.
+// The text before the reset does not matter.
 TEST_F(JarManifestCalls, ATableThatWasResetSortsAsOftenAsAFreshOne) {
   std::string text(100000, 'a');
-  text[90001] = 'b';  // the last name by its place and by its order
+  text[90001] = 'b';  // this name is the last in the text and in byte order
   const auto* const bytes = reinterpret_cast<const uint8_t*>(text.data());
   const auto repeat = [&](ManifestSections& sections) {
     comparisons = 0;
@@ -115,7 +117,7 @@ TEST_F(JarManifestCalls, ATableThatWasResetSortsAsOftenAsAFreshOne) {
 
 // ---- Looking up a name.
 
-// The number of comparisons for looking up the name in the middle.
+// The number of comparisons when the name in the middle is looked up.
 size_t ComparisonsOfFinding(const std::vector<std::string>& names) {
   std::string text;
   for (const std::string& name : names) text += "Name: " + name + "\r\nSHA1-Digest: 1\r\n\r\n";
@@ -128,8 +130,9 @@ size_t ComparisonsOfFinding(const std::vector<std::string>& names) {
   return comparisons;
 }
 
-// Comparing two entry names also compares a few attribute names. Sorted names are compared with
-// about log2(4096) others, unsorted names with the one of the same hash.
+// Comparing two entry names also compares a few attribute names. If the names are in order, the
+// name is compared with about log2(4096) others. If not, it is compared only with the one of the
+// same hash.
 TEST_F(JarManifestCalls, NamesInOrderAreNotHashed) {
   std::vector<std::string> names = ShortNames(4096);
   const size_t in_order = ComparisonsOfFinding(names);

@@ -1,6 +1,6 @@
-// Counts calls of the platform's library, because its answers do not show how often it is asked.
-// The linker sends the tool's calls here (CMakeLists.txt has the compiler's names), and they go on
-// to the library. A hostile document makes each call cost as much as it can.
+// Counts calls of the platform's library, because results do not show the number of calls. The
+// linker redirects the tool's calls to the functions below (CMakeLists.txt has the mangled names),
+// which call the library. A hostile document can make each call expensive.
 #include <androidfw/ResourceTypes.h>
 #include <gtest/gtest.h>
 #include <utils/String8.h>

@@ -45,7 +45,8 @@ Sections Parse(const std::string& text) {
   return SectionsOf(manifest);
 }
 
-// `text` must not parse; `message` is logged, and `sections` ended before the fault.
+// Expects that `text` does not parse, that `message` is logged, and that `sections` are the
+// sections before the fault.
 void ExpectFault(const std::string& text, const std::string& message,
                  const Sections& sections = {}) {
   LogCapture log;
@@ -82,8 +83,8 @@ TEST(ManifestMf, LoadStartsFromScratch) {
   EXPECT_EQ(Sections({{{"A", "1"}}}), SectionsOf(manifest));
 }
 
-// Loads texts of different shapes, some of which do not parse, each after each. Leftovers of one
-// would show in the result of the other.
+// Loads every pair of these texts, one after the other. Some do not parse. Leftovers of the first
+// text would show in the result of the second.
 TEST(ManifestMf, NothingOfAnEarlierTextSurvives) {
   std::string many = "Longer-Name: longer value\r\n\r\n";
   for (int i = 0; i < 50; ++i) many += "B" + std::to_string(i) + ": 1\r\nC: 2\r\n\r\n";
@@ -107,7 +108,7 @@ TEST(ManifestMf, NothingOfAnEarlierTextSurvives) {
   }
 }
 
-// The memory after the text holds bytes that would change the result.
+// The memory after the text contains bytes that would change the result.
 TEST(ManifestMf, NothingBehindTheTextIsRead) {
   LogCapture log;
   const std::string whole = "Name: abcdefghijklm\r\n nopq\r\nKey: 1\r\n\r\nB:\r\n\r\n";
@@ -242,7 +243,8 @@ TEST(ManifestMf, NameThatRunsIntoTheEndOfTheTextFails) {
   ExpectNoColon("A: 1\r\nNoColonHere\r\n", "NoColonHere\r\n");
 }
 
-// The whole name, or the part that the log takes: 1024 bytes with a NUL at the end.
+// The message contains the whole name, or as much of it as fits in a log record: 1024 bytes with a
+// NUL at the end.
 TEST(ManifestMf, NameThatRunsIntoTheEndOfTheTextIsToldAtAnyLength) {
   const std::string before = "Parse manifest: Error: P_KEY: unexpected end of file after key '";
   std::string name;
@@ -309,12 +311,12 @@ TEST(ManifestMf, LoneLineFeedAfterAValueLosesNothing) {
   EXPECT_EQ(Sections({{{"A", "1"}, {"Name", "x"}}}), Parse("A: 1\nName: x\n\n"));
 }
 
-// The second LF is taken for the line break, and "Name" follows in the same section.
+// The second LF counts as the line break, and "Name" follows in the same section.
 TEST(ManifestMf, EmptyLineAfterAColonAndALoneLineFeedIsNotSeen) {
   EXPECT_EQ(Sections({{{"B", "1"}, {"Name", "x"}}}), Parse("B: 1\nA:\n\nName: x\n\n"));
 }
 
-// The space is taken for the line break, and "value" begins a name.
+// The space counts as the line break, and "value" begins a name.
 TEST(ManifestMf, ContinuationAfterAColonAndALoneLineFeedIsAName) {
   EXPECT_EQ(Sections({{{"value\nName", "x"}}}), Parse("A:\n value\nName: x\n\n"));
 }
@@ -338,7 +340,7 @@ TEST(ManifestMf, EveryKindOfLineBreakEndsLinesAndSections) {
   }
 }
 
-// At every position in lines of every length, a byte either ends the line or it does not.
+// Tests every byte at every position of lines of 1 to 24 bytes.
 TEST(ManifestMf, OnlyCrLfAndNulEndALine) {
   for (size_t length = 1; length <= 24; ++length) {
     for (size_t at = 0; at < length; ++at) {
@@ -404,9 +406,10 @@ TEST(ManifestMf, EveryPrefixOfAManifestEnds) {
   }
 }
 
-// The tests below compare with the JDK's parser, on manifests as tools write them.
+// The test below compares the parser with the JDK's parser, on manifests as tools write them.
 
-// A line as the JAR File Specification defines it: at most 72 bytes, continued after a space.
+// A line as the JAR File Specification defines it: at most 72 bytes. A continuation line starts
+// with a space.
 std::string Line(const std::string& name, const std::string& value) {
   std::string line = name + ": " + value;
   std::string text;
@@ -425,7 +428,7 @@ class ManifestWriter {
     std::string text = Line("Manifest-Version", "1.0") + Attributes() + "\r\n";
     const uint32_t sections = Pick(20);
     for (uint32_t i = 0; i < sections; ++i) {
-      // A continuation line splits letters of two bytes.
+      // A continuation line may split a character of two or three bytes.
       const std::string name = "assets/\xC3\xA4\xE2\x82\xAC" + std::to_string(i) + Value();
       text += Line("Name", name) + Attributes() + "\r\n";
     }

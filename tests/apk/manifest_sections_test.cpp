@@ -106,8 +106,8 @@ TEST(ManifestSection, FindsTheLastNameWithTheSuffix) {
   EXPECT_EQ(std::make_pair(std::string_view(), std::string_view()), section.findLastEndingIn("-Q"));
 }
 
-// A sort that is not stable may still keep a few equal names in order. It does not keep this many.
-// The sections have different sizes, so that the table grows while a section is open.
+// A sort that is not stable may keep a few equal names in order by chance, but not so many. The
+// sections have different sizes, so that the table grows while a section is open.
 TEST(ManifestSection, OfEqualNamesTheLastInTheTextCounts) {
   std::mt19937 random(1);
   Table table(8 << 20);

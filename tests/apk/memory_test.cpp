@@ -1,5 +1,5 @@
-// The memory that hostile and large packages cost. Each package is opened in a process of its own,
-// because the peak of a process never falls.
+// Tests how much memory hostile and large packages take. Each package is opened in its own process,
+// because the peak memory of a process never falls.
 #include <fcntl.h>
 #include <gtest/gtest.h>
 #include <sys/wait.h>
@@ -33,7 +33,8 @@ long PeakMemory() {
   return -1;
 }
 
-// The growth of the peak by `task`, in kilobytes; -1 if the process dies or `task` returns false.
+// The growth of the peak memory during `task`, in kilobytes; -1 if the process dies or `task`
+// returns false.
 long PeakGrowth(const std::function<bool()>& task) {
   int ends[2];
   EXPECT_EQ(pipe(ends), 0);
@@ -77,7 +78,8 @@ TEST(ApkMemory, AFewBytesThatDeclareGigabytesTouchLittle) {
   EXPECT_LT(growth, kLittleMemory);
 }
 
-// The growth of the peak by a package whose signature file is this text, which compresses well.
+// The growth of the peak memory for a package whose signature file is this text. The text
+// compresses well.
 long GrowthWithSignatureFile(const std::string& text) {
   Package package = MakePackage(WithoutDex());
   ZipItem& signature_file = package.Item("META-INF/CERT.SF");
@@ -93,16 +95,16 @@ std::string Repeat(const std::string& text, size_t count) {
   return whole;
 }
 
-// 40 MB in 40 kB: one section that repeats one name. It costs no more than the text and one copy of
-// it.
+// The text is one section that repeats one name: 40 MB, compressed to 40 kB. The verification must
+// not make a second copy of the text.
 TEST(ApkMemory, NamesThatRepeatTakeNone) {
   const long growth = GrowthWithSignatureFile(Repeat("A: 1\n", 8000000));
   EXPECT_GE(growth, 39 * kMegabyte);
   EXPECT_LT(growth, 60 * kMegabyte + kKept);
 }
 
-// A million sections of one attribute. Each takes 20 bytes in the table, and again while the table
-// grows. Repeated names after them take no memory.
+// A million sections of one attribute each. A section takes 20 bytes in the table, and 20 more
+// bytes while the table grows. Repeated names after these sections take no memory in the table.
 TEST(ApkMemory, NamesThatRepeatTakeNoneAfterManySections) {
   const std::string sections = Repeat("A: 1\n\n", 1000000);
   const long growth = GrowthWithSignatureFile(sections);
@@ -110,9 +112,10 @@ TEST(ApkMemory, NamesThatRepeatTakeNoneAfterManySections) {
             growth + 30 * kMegabyte + kKept);
 }
 
-// A document whose string pool has overlapping UTF-8 strings. Each starts with its two lengths,
-// which are text to the strings before it, and all end with the pool's last byte. For an element of
-// each name the platform's library makes a separate copy in UTF-16.
+// A document whose string pool has overlapping UTF-8 strings. Each string starts with its two
+// lengths, which are also part of the strings before it. All strings end with the pool's last byte.
+// Each string is the name of an element, and the platform's library makes a separate UTF-16 copy of
+// each name.
 Bytes DocumentOfOverlappingStrings() {
   constexpr uint32_t kText = 16000, kHeader = 28;
   Bytes text(kText, 'a'), offsets, elements;
@@ -143,15 +146,15 @@ Bytes DocumentOfOverlappingStrings() {
   return Concat({document, pool, offsets, text, elements});
 }
 
-// The library keeps its conversions. The tool cannot know in advance how much memory a name will
-// take.
+// The library keeps each converted string. The tool cannot know in advance how much memory a name
+// will take.
 TEST(ApkMemory, OverlappingStringsOfTheAndroidManifestTakeMuchOfThePlatformsMemory) {
   const Bytes document = DocumentOfOverlappingStrings();
   const long growth = PeakGrowth([&] { return ApkTools::Apk(-1).ParseAndroidManifest(document); });
   EXPECT_GT(growth * 1024, 100 * static_cast<long>(document.size()));
 }
 
-// One library at a time, in rising and in falling order of size.
+// Verifies one library at a time. The sizes rise and fall from one library to the next.
 TEST(ApkMemory, LibrariesTakeTheLargestOnesSize) {
   PackageOptions options = WithoutDex();
   TempDir directory;

@@ -1,4 +1,4 @@
-// A package whose key does not fit in memory.
+// Tests the verification of a package if allocations fail.
 #include <gtest/gtest.h>
 
 #include "support/failing_malloc.h"
@@ -7,7 +7,7 @@
 
 namespace {
 
-// Only the integers allocate with malloc.
+// Only the large integers are allocated with malloc.
 TEST(VerifyCertificate, AKeyThatFindsNoMemoryIsReportedWithItsCode) {
   const Bytes archive = MakePackage().Build();
   LogCapture log;
@@ -19,7 +19,8 @@ TEST(VerifyCertificate, AKeyThatFindsNoMemoryIsReportedWithItsCode) {
                                     Error("file not verified: META-INF/CERT.SF\n")}));
 }
 
-// Each later failure stops a verification: of the certificate first, and then of the data.
+// Each later failed allocation stops a verification: first that of the certificate, and then that
+// of the data.
 TEST(VerifyCertificate, AVerificationThatFindsNoMemoryIsReportedWithItsCode) {
   const Bytes archive = MakePackage().Build();
   int certificates = 0, signatures = 0;
@@ -34,8 +35,8 @@ TEST(VerifyCertificate, AVerificationThatFindsNoMemoryIsReportedWithItsCode) {
     ASSERT_EQ(log.records().size(), 2u) << call;
     const bool certificate = log.records()[0] == Error("RSA could not verify certificate: 11\n");
     const bool data = log.records()[0] == Error("RSA could not verify data: 11\n");
-    // Only the exponent may be missing without an error. Then nothing verifies, because a number to
-    // the power of 0 has no valid padding.
+    // Only the allocation of the exponent may fail without an error. The exponent is then 0, and
+    // nothing verifies, because a number to the power of 0 has no valid padding.
     EXPECT_TRUE(certificate || data ||
                 log.records()[0] == Error("RSA could not verify certificate: 7\n"))
         << call << ": " << log.records()[0];

@@ -1,5 +1,5 @@
-// Init on a used object, with packages of different shapes, each after each. Leftovers of one would
-// show in the facts of the other (docs/decisions/second-init.md).
+// Tests Init on a used object, with every pair of packages of different shapes. Leftovers of the
+// first package would show in the facts of the second (docs/decisions/second-init.md).
 #include <gtest/gtest.h>
 
 #include <fcntl.h>
@@ -19,7 +19,7 @@ using ApkTools::Apk;
 
 namespace {
 
-// Names of entries of the packages. Each entry has its name as its content.
+// The names of the entries in the packages. The content of each entry is its name.
 constexpr const char* kNames[] = {"a", "b", "c", "lib/long/name/of/an/entry.so", "classes.dex"};
 
 // All facts of an object about its package.
@@ -67,18 +67,18 @@ PackageOptions WithEntries(const std::vector<std::string>& names) {
   return options;
 }
 
-// Good packages. The object must have all facts from the package's own file.
+// Good packages. After Init, all facts must come from the package's own file.
 std::vector<PackageOptions> GoodPackages() {
   std::vector<PackageOptions> all;
   // Names in order, and a dex file.
   all.push_back(WithEntries({"a", "b", "classes.dex"}));
-  // Names not in order, SHA-1, a longer key, another name of the storage permission.
+  // Names not in order, SHA-1, a longer key, a longer package name, the storage permission.
   all.push_back(WithEntries({"lib/long/name/of/an/entry.so", "c", "a"}));
   all.back().digests = {"SHA1-Digest"};
   all.back().block.key = "rsa-3072";
   all.back().package_name = "org.example.a.longer.name";
   all.back().secure_storage = true;
-  // No name, a short key, one entry.
+  // No package name, a short key, one entry.
   all.push_back(WithEntries({"c"}));
   all.back().block.key = "rsa-1024";
   all.back().package_name = "";

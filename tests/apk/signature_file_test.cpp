@@ -114,7 +114,7 @@ TEST(InitCertSf, BlocksOfOtherKindsAreNotLookedFor) {
   }
 }
 
-// The library has its own order of entries, so it is asked which comes first.
+// The zip library has its own order of entries, so the test reads the first entry from it.
 TEST(InitCertSf, OfTwoSignersTheFirstInTheArchivesOrderDecides) {
   PackageOptions options;
   options.base_name = "META-INF/OTHER";
@@ -159,7 +159,8 @@ Records RefusedTwice() {
   return {Error("Can't validate manifest.\n"), Error("Can't validate manifest.\n")};
 }
 
-// A section of "-Digest-Manifest" attributes, each over the package's manifest or over other bytes.
+// A section of "-Digest-Manifest" attributes. Those in `right` are digests of the package's
+// manifest, and those in `wrong` are digests of other bytes.
 JarText ManifestDigests(const std::vector<std::string>& right,
                         const std::vector<std::string>& wrong) {
   const Bytes manifest = MakePackage().Item(kManifestName).data;
@@ -253,7 +254,7 @@ TEST(ValidateManifest, ANameThatIsTheSuffixAloneIsAMatchWithoutAnAlgorithm) {
                      Error("Can't validate manifest.\n"), Error("Can't validate manifest.\n")}));
 }
 
-// An empty expected digest is refused before its algorithm is looked at.
+// An empty expected digest is refused before its algorithm is checked.
 TEST(ValidateManifest, AnEmptyMd5DigestIsRefusedWithoutAMessageAboutMd5) {
   EXPECT_EQ(LogOf(WithSignatureFile("MD5-Digest-Manifest: ====\r\n\r\n")),
             Records({Error("Can't validate manifest.\n"), Error("Can't validate manifest.\n")}));

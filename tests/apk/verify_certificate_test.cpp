@@ -1,4 +1,4 @@
-// The signature block of a package: the key that it holds, and what that key signed.
+// Tests the signature block of a package: the key in it, and the data that this key signed.
 #include <gtest/gtest.h>
 
 #include <algorithm>
@@ -91,8 +91,8 @@ TEST(VerifyCertificate, ASignatureOverOtherBytesFails) {
                      Error(kNotVerified)}));
 }
 
-// The bytes taken for the signature are an AlgorithmIdentifier and the element after it. They give
-// no padding, even if the message itself is signed.
+// The bytes that are read as the signature are an AlgorithmIdentifier and the element after it.
+// They have no valid padding, even if the real signature is good.
 TEST(VerifyCertificate, AuthenticatedAttributesFail) {
   SignatureBlock block;
   block.authenticated_attributes = true;
@@ -100,7 +100,7 @@ TEST(VerifyCertificate, AuthenticatedAttributesFail) {
             Records({Error("RSA could not verify data: 7\n"), Error(kNotVerified)}));
 }
 
-// A certificate with this RSAPublicKey, and a signature that fills the block.
+// A block whose certificate has this RSAPublicKey, and a signature of this length.
 SignatureBlock WithPublicKey(const Bytes& modulus, const Bytes& exponent, size_t signature_length) {
   Certificate certificate;
   certificate.public_key_info =
@@ -117,7 +117,8 @@ TEST(VerifyCertificate, AKeyOf2048BytesAlreadyFailsAtTheCertificate) {
 }
 
 TEST(VerifyCertificate, AnEmptyKeyFailsAtTheCertificate) {
-  // An INTEGER of two bytes, 0 and 1, is the one-byte modulus 1; its length bounds the exponent.
+  // The INTEGER of two bytes, 0 and 1, is the one-byte modulus 1. The length of two bytes also
+  // limits the exponent's element.
   EXPECT_EQ(LogOf(WithBlock(WithPublicKey({0, 1}, {}, 256))),
             Records({Error("RSA could not verify certificate: 5\n"), Error(kNotVerified)}));
 }
@@ -131,8 +132,8 @@ TEST(VerifyCertificate, AnExponentThatRunsIntoTheModulusLengthStaysInTheBlock) {
 }
 
 TEST(VerifyCertificate, AModulusThatEndsWithTheBlockIsRead) {
-  // The exponent's second half sets the length of the modulus: up to the block's last byte, then
-  // one more.
+  // The second half of the exponent sets the length of the modulus. The modulus first ends at the
+  // block's last byte, and then one byte later.
   const auto block_with_length = [](uint32_t length) {
     Bytes exponent = FromHex("01000100");
     for (int i = 0; i < 4; ++i) exponent.push_back(static_cast<uint8_t>(length >> (8 * i)));
@@ -165,7 +166,7 @@ TEST(VerifyCertificate, ASignatureThatTheBlockEndsBeforeFails) {
             Records({Error("RSA could not verify data: 5\n"), Error(kNotVerified)}));
 }
 
-// A package whose block holds the result of `encode` as its signature.
+// A package whose block has the result of `encode` as its signature.
 template <typename Encode>
 PackageOptions WithEncodedSignature(Encode encode) {
   PackageOptions options;

@@ -1,4 +1,4 @@
-// The adapter of the zip library, for both generations of the library.
+// Tests the adapter to the zip library, for both generations of the library.
 #include "apk/zip_library.h"
 
 #include <gtest/gtest.h>

@@ -1,4 +1,5 @@
-// Each reason with the package that has it, what goes on to the log, and what is released.
+// Tests each reason with a package that is refused for it, the lines in the log, and the release of
+// the archive.
 #include "library/verification.h"
 
 #include <fcntl.h>
@@ -20,7 +21,7 @@ using ApkTools::Verification;
 namespace {
 
 // The reason why the file is refused. The parser of signature blocks prints to standard output, and
-// the log to standard error; neither is of interest.
+// the log prints to standard error. The test discards both outputs.
 Reason ReasonOf(const Bytes& content) {
   const MemoryFile file(content);
   testing::internal::CaptureStdout();
@@ -47,13 +48,14 @@ Reason ReasonWithSignatureFile(const std::string& text) {
   return ReasonOf(options);
 }
 
-// The package without its entry of this name, and with one that cannot be extracted.
+// The package without its entry of this name.
 Package Without(const std::string& name) {
   Package package = MakePackage();
   package.Remove(name);
   return package;
 }
 
+// The package with an entry of this name that cannot be extracted.
 Package WithUnreadable(const std::string& name) {
   Package package = MakePackage();
   ZipItem& item = package.Item(name);
@@ -91,7 +93,7 @@ TEST(VerificationReason, SaysWhatTheFileIs) {
   EXPECT_EQ(ReasonOf(WithUnreadable(kAndroidManifestName)), Reason::kAndroidManifestUnreadable);
 }
 
-// An entry whose name only begins so is not the manifest.
+// An entry whose name only begins with the manifest's name is not the manifest.
 TEST(VerificationReason, GoesByTheWholeNameOfAnEntry) {
   PackageOptions options = PlainJar();
   options.entries.push_back({"AndroidManifest.xml.bak", ToBytes("x")});
@@ -156,7 +158,7 @@ TEST(VerificationReason, HasATextOfItsOwnForEach) {
   EXPECT_STREQ(TextOf(Reason::kManifestRefused), "its manifest is not what was signed");
 }
 
-// A verification within another's life has its own.
+// A verification that is made while another one exists has its own reason.
 TEST(VerificationReason, IsThatOfItsOwnPackage) {
   const MemoryFile bad(WithTampered(kManifestName).Build());
   const MemoryFile good(MakePackage().Build());
@@ -183,15 +185,16 @@ TEST(VerificationRelease, TwoThousandPackagesLeaveNoMappings) {
     Verification verification(file.fd());
     EXPECT_EQ(verification.reason(), Reason::kGood);
   };
-  verify();  // what is made once in a process
+  verify();  // makes the mappings that a process makes only once
   const size_t before = CountMappings();
   for (size_t i = 0; i < 2000; ++i) verify();
-  constexpr size_t kMostOfAllocators = 50;  // may have grown or split its own
+  constexpr size_t kMostOfAllocators = 50;  // mappings that allocators may add or split
   EXPECT_LE(CountMappings(), before + kMostOfAllocators);
   EXPECT_GE(fcntl(file.fd(), F_GETFD), 0) << "the descriptor is the caller's";
 }
 
-// The tool's own objects leave theirs, and the count above would see it.
+// An Apk that is not released leaves its mapping. The test above would therefore detect a missing
+// release.
 TEST(VerificationRelease, WithoutItEachPackageLeavesAMapping) {
   const MemoryFile file(MakePackage().Build());
   const size_t before = CountMappings();

@@ -1,5 +1,6 @@
-// A library that is touched, exchanged or written to while the tool works on it. Each change comes
-// at an exact moment: before an open, after it, before and after a read, before the kernel signs.
+// Tests a library that is touched, exchanged or written to while the tool works on it. Each change
+// happens at an exact moment: before or after an open, before or after a read, or before the kernel
+// signs.
 #include <gtest/gtest.h>
 #include <sys/stat.h>
 
@@ -33,7 +34,7 @@ class ChangedLibrary : public testing::Test {
   void SetUp() override { alarm(60); }  // ends a test that waits for a FIFO
   void TearDown() override { alarm(0); }
 
-  // The library is signed after this number of digests, and nothing else is logged.
+  // Expects that the library is signed after this number of digests, and that no refusal is logged.
   void ExpectSigned(int digests) {
     EXPECT_EQ(file_.SignJni(), 0U);
     EXPECT_EQ(signed_, std::vector<Bytes>({kGood.data}));
@@ -58,7 +59,8 @@ class ChangedLibrary : public testing::Test {
   void Rename(const std::string& name) const {
     EXPECT_EQ(rename(file_.Path(name).c_str(), target_.c_str()), 0);
   }
-  // Makes the library's path lead to the file of this name, whose state does not change.
+  // Makes the library's path a symbolic link to the file of this name. The state of that file does
+  // not change.
   void Link(const std::string& name) const {
     unlink(target_.c_str());
     EXPECT_EQ(symlink(file_.Path(name).c_str(), target_.c_str()), 0);
@@ -72,7 +74,8 @@ class ChangedLibrary : public testing::Test {
     });
   }
 
-  // Changes the file until its state shows it, because a file system's clock is coarse.
+  // Repeats the change until the file's ctime is different, because a file system's clock is
+  // coarse.
   void UntilNoticed(const Change& change) const {
     const struct stat before = State();
     do {
@@ -86,7 +89,7 @@ class ChangedLibrary : public testing::Test {
     return state;
   }
 
-  // The number of this process's descriptors that are open on the library.
+  // The number of open descriptors of this process for the library.
   int DescriptorsOfLibrary() const {
     const struct stat library = State();
     int count = 0;
@@ -189,7 +192,7 @@ TEST_F(ChangedLibrary, ExchangedAfterItsSecondOpeningIsSignedAsItWasOpened) {
   ExpectSigned(2);
 }
 
-// The file has lost its name, which changes its state.
+// The rename removes the name of the file that was read, which changes the file's ctime.
 TEST_F(ChangedLibrary, ExchangedAfterItsLastByteIsSignedAsItWasRead) {
   before_second_open_ = [this] { Rename("good"); };
   after_digest_[2] = [this] { Rename("evil"); };
@@ -201,8 +204,8 @@ TEST_F(ChangedLibrary, ExchangedBeforeTheKernelSignsIsSignedAsItWasRead) {
   ExpectSigned(1);
 }
 
-// The path leads to the file that was read, in its former state. Only the descriptor shows the
-// exchange.
+// After the opening, the path again leads to the file that was read, and the file's state is
+// unchanged. Only the descriptor shows the exchange.
 TEST_F(ChangedLibrary, ExchangedForTheMomentOfItsOpeningIsRefused) {
   Link("good");
   before_second_open_ = [this] { Link("evil"); };
@@ -232,8 +235,8 @@ TEST_F(ChangedLibrary, ExchangedForADirectoryIsRefusedAtOnce) {
   ExpectRefused(1);
 }
 
-// A file system may give a removed file's inode number to the next file. With the same size, and
-// with times of the same clock tick, it would look like the file that was read.
+// A file system may give a removed file's inode number to the next file. If that file has the same
+// size, and times of the same clock tick, it looks like the file that was read.
 TEST_F(ChangedLibrary, IsKeptOpenUntilItIsOpenedAgainSoThatNoOtherFileGetsItsNumber) {
   after_digest_[1] = [this] { EXPECT_EQ(DescriptorsOfLibrary(), 1); };
   before_second_open_ = [this] { EXPECT_EQ(DescriptorsOfLibrary(), 1); };
@@ -277,7 +280,7 @@ TEST_F(ChangedLibrary, WrittenToAfterItsThirdDigestIsRefused) {
   ExpectRefused(3);
 }
 
-// --- Under a lease, which an open breaks: the tool waits for its holder.
+// --- Under a lease. An open breaks the lease, and the tool waits for its holder.
 
 TEST_F(ChangedLibrary, ThatIsLeasedAtItsSecondOpeningIsSigned) {
   int asked = 0;
@@ -285,10 +288,11 @@ TEST_F(ChangedLibrary, ThatIsLeasedAtItsSecondOpeningIsSigned) {
     return path == target_ && ++asked == 2 ? EWOULDBLOCK : 0;
   };
   ExpectSigned(1);
-  EXPECT_EQ(asked, 3);  // the third pins the file, which is then opened through its descriptor
+  EXPECT_EQ(asked, 3);  // the third pins the file; its link in /proc is then opened
 }
 
-// Meanwhile the holder can put anything in the file's place.
+// Before the tool opens the file again, the holder of the lease could put another file in its
+// place.
 TEST_F(ChangedLibrary, ThatIsLeasedAndThenAFifoIsNotWaitedFor) {
   int asked = 0;
   file_.phone.open_error = [&](const char* path, int) {

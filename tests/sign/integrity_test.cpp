@@ -17,8 +17,8 @@ using Events = std::vector<std::string>;
 constexpr char kSelf[] = "integrity /proc/self/integrity/value";
 constexpr uint8_t kPayload[] = {3, 0, 0xaa, 0xbb, 0xcc};  // length 3, then 3 bytes
 
-// The codes are part of the interface: 0 for success, and 65536 for every failure. Neither the
-// cause nor the kernel's own number matters.
+// The codes are part of the interface: 0 for success, and 65536 for every failure. The cause and
+// the kernel's own error number do not matter.
 TEST(VeltResultCode, EveryFailureIs65536) {
   constexpr uint32_t kFailure = 65536;
   Phone phone;
@@ -87,7 +87,7 @@ TEST(VeltSignFd, WaitsInSteps10MillisecondsLongUntilTheValueSettles) {
             Events({kSelf, "sleep 10000", kSelf, "sleep 10000", kSelf, "sign 7 0300aabbcc"}));
 }
 
-// A hundred seconds, on a phone that does not sleep.
+// The value settles after a hundred seconds. The Phone does not really sleep.
 TEST(VeltSignFd, WaitsHoweverLongTheValueTakes) {
   constexpr size_t kSteps = 10000;
   Phone phone;

@@ -1,5 +1,5 @@
-// main before and around the three steps, as a process without a phone. Its log goes to standard
-// error.
+// Tests main before and around the three steps, in a process without a phone. The tool's log goes
+// to standard error.
 #include <gtest/gtest.h>
 #include <sys/stat.h>
 

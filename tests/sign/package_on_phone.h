@@ -1,4 +1,4 @@
-// A package on disk, its libraries beside it, on a phone inside the test program.
+// A package on disk with its libraries beside it, on a phone inside the test program.
 #pragma once
 
 #include <fcntl.h>
@@ -20,8 +20,8 @@ using Events = std::vector<std::string>;
 
 inline constexpr char kSelf[] = "integrity /proc/self/integrity/value";
 
-// The payload of every package signed with the key "rsa-2048": the length 32, then the digest of
-// its modulus, by libcrypto.
+// The payload of every package signed with the key "rsa-2048": the length 32, then the SHA-256
+// digest of the key's modulus, computed by libcrypto.
 inline std::string PackagePayload() {
   const Bytes modulus = ModulusOf("rsa-2048");
   uint8_t digest[SHA256_DIGEST_LENGTH];

@@ -1,4 +1,4 @@
-// Registrations: the file, the name, the bytes, and the log about them.
+// Tests registrations: the file, the name, the bytes, and the log.
 #include "sign/registration.h"
 
 #include <gtest/gtest.h>
@@ -37,8 +37,8 @@ std::string RegisterPackage(int fd) {
   return "register " + std::to_string(fd) + " com.example.app " + Hex(ModulusOf("rsa-2048"));
 }
 
-// Four SHA-256 digests by libcrypto. The first is of the path's bytes, each other of the one before
-// it.
+// The event with four SHA-256 digests by libcrypto. The first is the digest of the path. Each other
+// one is the digest of the one before it.
 std::string RegisterJar(int fd, const std::string& path) {
   uint8_t block[4 * SHA256_DIGEST_LENGTH];
   SHA256(reinterpret_cast<const uint8_t*>(path.data()), path.size(), block);
@@ -89,7 +89,7 @@ TEST(ZuSign, TheRegistrationIsMadeForTheSecondDescriptor) {
 }
 
 TEST(ZuSign, APackageWithThePermissionThatTurnedBadIsNotRegistered) {
-  // The permission is known only if the manifest verified. The dex file is bad.
+  // The permission is known only if the manifest verified, so only the dex file is bad.
   Package package = SecureStoragePackage();
   package.Tamper("classes.dex");
   ArchiveOnPhone file(package);
@@ -119,7 +119,7 @@ TEST(ZuSign, AJarWithoutTheAttributeIsLeftAlone) {
   EXPECT_EQ(file.log.records(), Records());
 }
 
-// Only the attribute's size is read, on the first descriptor's file.
+// Only the size of the attribute is read, from the file of the first descriptor.
 TEST(ZuSign, TheAttributeIsAskedOfTheFirstDescriptorWithoutABuffer) {
   ArchiveOnPhone file(MakePackage(PlainJar()));
   file.phone.zu_attribute_size = 1;

@@ -1,5 +1,5 @@
-// The files that the kernel is asked to sign, their payloads, and the log about them. Packages are
-// real files with their libraries beside them; the kernel is the Phone's.
+// Tests which files the tool asks the kernel to sign, their payloads, and the log. Packages are
+// real files with their libraries beside them. A Phone takes the place of the kernel.
 #include "sign/signing.h"
 
 #include <fcntl.h>
@@ -19,7 +19,7 @@ Package BadPackage() {
   return package;
 }
 
-// The library that comes first in the walk over the package.
+// The library that comes first in the iteration over the package.
 std::string FirstOf(ApkTools::Apk& apk) {
   void* cookie = nullptr;
   EXPECT_EQ(apk.StartIteration(&cookie, "lib/", ".so"), 0);
@@ -210,10 +210,10 @@ TEST(VeltSignJni, AnEntryOfNoRowIsPassedOverWithoutAMessage) {
   EXPECT_EQ(file.log.records(), Records({Starts(file.fd()), Finished()}));
 }
 
-// The zip library orders the two by their names.
+// The zip library decides the order of the two libraries by their names.
 TEST(VeltSignJni, ALibraryOfAnotherAbiDoesNotEndTheWalkInEitherOrder) {
   const ZipItem library = Library("lib/arm64-v8a/libfoo.so");
-  int first = 0, last = 0;  // how often the other library was
+  int first = 0, last = 0;  // how often the other library came first or last
   for (int i = 0; i < 100 && (first == 0 || last == 0); ++i) {
     const ZipItem other = Library("lib/x86/lib" + std::to_string(i) + ".so");
     PackageOnPhone file(MakePackage(WithLibraries({library, other})));
@@ -228,7 +228,8 @@ TEST(VeltSignJni, ALibraryOfAnotherAbiDoesNotEndTheWalkInEitherOrder) {
   EXPECT_GT(last, 0);
 }
 
-// Signs the entry, with its file at `installed`. True if the kernel was asked to sign it.
+// Signs the libraries of a package with this entry, whose file is at `installed`. True if the
+// kernel received a request to sign that file.
 bool IsFoundAt(const std::string& entry, const std::string& installed) {
   const ZipItem library = Library(entry);
   PackageOnPhone file(MakePackage(WithLibraries({library})));
@@ -303,7 +304,7 @@ TEST(VeltSignJni, ALibraryWhoseBytesDifferIsNotSignedAndTheOthersAre) {
   file.Install("lib/arm64/libb.so", {"", ToBytes("\177ELF other bytes")});
   EXPECT_EQ(file.SignJni(), 0U);
   EXPECT_EQ(file.phone.events, Events({kSelf, SignEvent(file.fd() + 1)}));
-  // The zip library orders the two.
+  // The zip library decides the order of the two libraries.
   const LogRecord refused =
       Error("VeltSignJni: File not verified: " + file.Path("lib/arm64/libb.so") + "\n");
   const LogRecord signs = Info("VeltSignOat: Apk case.\n");

@@ -1,5 +1,5 @@
-// The calls to the zip library, because its answers do not show them. The linker sends the tool's
-// calls here (CMakeLists.txt has the compiler's names), and they go on to the library.
+// Tests the calls of the zip library that results do not show. The linker redirects the tool's
+// calls to the functions below (CMakeLists.txt has the mangled names), which call the library.
 #include <gtest/gtest.h>
 
 #include <algorithm>
@@ -15,7 +15,7 @@ using ApkTools::Apk;
 
 namespace {
 
-constexpr int32_t kInvalidHandle = -4;  // the library's
+constexpr int32_t kInvalidHandle = -4;  // the zip library's code
 
 struct ZipCalls {
   std::vector<bool> ownership;       // whether archives own their descriptors

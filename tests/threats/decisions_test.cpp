@@ -1,5 +1,6 @@
-// The two refusals that no signing tool's package ever meets: an exponent of 1, and a library that
-// has changed since it was read. The packages are made by aapt and apksigner.
+// Tests the two refusals that no package of a signing tool causes: the refusal of an exponent of 1,
+// and the refusal of a library that has changed since it was read. The packages are made by aapt
+// and apksigner.
 #include <sys/stat.h>
 
 #include <algorithm>
@@ -11,7 +12,7 @@
 
 namespace {
 
-// ---- An exponent of 1: anyone can write down signatures for any key.
+// ---- With an exponent of 1, anyone can write signatures for any key.
 
 // The victim's package with a forged signature block.
 Bytes WithForgedBlock(const Bytes& exponent) {
@@ -26,8 +27,8 @@ Bytes WithForgedBlock(const Bytes& exponent) {
   return ToBytes(ContentOf(apk));
 }
 
-// All ways to write 1 and -1 so that the record reads them, with any tail that keeps the length of
-// the modulus at 256: 00 01 00 00 in host byte order.
+// All forms of bytes that are read as the exponents 1 and -1. Bytes 5 to 8 set the length of the
+// modulus, and must keep it at 256: 00 01 00 00 in host byte order.
 TEST(Threat, AnExponentOfOneIsRefusedInEveryForm) {
   for (const char* exponent :
        {"01", "01 00", "01 00 00", "01 00 00 00", "FF FF FF FF", "01 00 00 00 00 01",

@@ -39,14 +39,15 @@ class Device {
   // The absolute path.
   std::string Path(const std::string& path) const { return temp_ / ("app/" + path); }
 
-  // The names of the files that were signed with the key of `signer`, in order, relative to the
-  // directory above the package's.
+  // Runs the steps. Returns the names of the files that were signed with the payload for the key of
+  // `signer`, in order, relative to the directory above the package's directory.
   Strings FilesSignedFor(const std::string& signer) {
     const std::string payload = "2000" + Hex(DigestOf(Digest::kSha256, ModulusOf(signer)));
     return FilesSignedWith(payload);
   }
 
-  // The same for payloads that begin with these hexadecimal digits.
+  // Runs the steps. Returns the names of the files whose payload begins with these hexadecimal
+  // digits.
   Strings FilesSignedWith(const std::string& payload) {
     Strings files;
     phone.witness = [&](int fd, const std::string& event) {
@@ -61,7 +62,7 @@ class Device {
     return files;
   }
 
-  // The registrations with libzu: name and data.
+  // Runs the steps. Returns the registrations with libzu: name and data.
   Strings Registered() {
     RunSteps();
     Strings registered;

@@ -1,5 +1,5 @@
-// Documents and manifests at the very end of memory. If the platform's parser, or the tool's own,
-// reads beyond them, the test crashes.
+// Tests documents and manifests at the very end of memory. If the platform's parser or the tool's
+// parser reads beyond them, the test crashes.
 #include <gtest/gtest.h>
 
 #include "apk/apk.h"
@@ -11,8 +11,9 @@
 
 namespace {
 
-// Parses the document in the block that the tool makes for it, at the end of memory. The block also
-// has room for a missing attribute (20 bytes), or for the missing header of a chunk (8 bytes).
+// Parses the document at the end of memory, in the block that the tool allocates for it. The block
+// is longer than the document by 20 bytes. A missing attribute (20 bytes) or chunk header (8 bytes)
+// fits in them.
 bool ParseAtMemoryEnd(ApkTools::Apk* apk, const Bytes& document) {
   PutNextBlockAtMemoryEnd(document.size() + 20);
   const bool parsed = apk->ParseAndroidManifest(document);
@@ -36,8 +37,8 @@ void SetSize(Bytes* document, size_t chunk, size_t size) {
   for (size_t i = 0; i < 4; ++i) (*document)[chunk + 4 + i] = static_cast<uint8_t>(size >> (8 * i));
 }
 
-// The last node ends this many bytes before the document. The parser looks there for another
-// header.
+// The last node ends `rest` bytes before the end of the document. The parser looks for another
+// header in these bytes.
 TEST(CompiledManifestAtMemoryEnd, IsNotReadBeyondForANodeThatIsNotThere) {
   for (uint8_t rest = 1; rest <= 8; ++rest) {
     Bytes document = CompiledManifest("com.example.app", true);
@@ -51,7 +52,8 @@ TEST(CompiledManifestAtMemoryEnd, IsNotReadBeyondForANodeThatIsNotThere) {
   }
 }
 
-// An attribute of size 0 may lie at the end of its element. All of its fields lie beyond that.
+// An attribute of size 0 may be at the end of its element. All its fields are then beyond the
+// element.
 TEST(CompiledManifestAtMemoryEnd, IsNotReadBeyondForAnAttributeThatIsNotThere) {
   constexpr size_t kNode = 36, kAttribute = 20;
   Bytes document =
@@ -102,7 +104,7 @@ TEST(EntryDigestsAtMemoryEnd, AreSortedWithoutOneMore) {
 }
 
 // The table is full when it is sorted, at the 33rd attribute. The name of that attribute is the
-// first to begin 1024 bytes or more into the text.
+// first that starts at offset 1024 or later in the text.
 TEST(ManifestSectionsAtMemoryEnd, AreNotReadBeyondTheLastAttribute) {
   constexpr uint32_t kAttributes = 33;
   std::string text;
@@ -119,8 +121,8 @@ TEST(ManifestSectionsAtMemoryEnd, AreNotReadBeyondTheLastAttribute) {
   EXPECT_EQ(sections[0].find("83"), std::string(30, 'v'));
 }
 
-// Names and values of all lengths below eight bytes, which are read at once; the text is whole, or
-// cut anywhere. A block ends where memory ends if its size is a multiple of 4.
+// Names and values of 1 to 19 bytes: the parser reads eight bytes at once. The text is cut at each
+// multiple of 4 bytes, because only a block of such a size ends exactly where memory ends.
 TEST(JarManifestAtMemoryEnd, IsNotReadBeyondAtAnyLength) {
   for (size_t length = 1; length < 20; ++length) {
     const std::string run(length, 'v');

@@ -1,5 +1,5 @@
-// Attacks with packages that aapt and apksigner made, on an install path that leaves the JAR
-// signature to this tool (docs/threat-model.md).
+// Tests attacks with packages that aapt and apksigner made. The install path leaves the check of
+// the JAR signature to this tool (docs/threat-model.md).
 #include <gtest/gtest.h>
 
 #include <filesystem>
@@ -18,7 +18,7 @@ std::string Made(const std::string& name) {
   return std::filesystem::canonical(THREAT_PACKAGES).string() + "/" + name + "/base.apk";
 }
 
-// The events if both libraries and the package are signed for the key, and the key is registered.
+// The events of a run that signs both libraries and the package for the key, and registers the key.
 std::string AllSignedAndRegistered(const std::string& apk, const std::string& key,
                                    const std::string& name) {
   const std::string directory = std::filesystem::path(apk).parent_path();
@@ -53,7 +53,7 @@ INSTANTIATE_TEST_SUITE_P(Rsa, KeyOfApksigner,
 
 class ForeignMetaInf : public testing::TestWithParam<const char*> {
  protected:
-  // The package below the attacker's own signing block, with its libraries beside it.
+  // The package with the attacker's own APK signing block, and with its libraries beside it.
   ForeignMetaInf() : apk_(directory_ / "base.apk") {
     std::filesystem::copy(std::filesystem::path(Made(GetParam())).parent_path() / "lib",
                           directory_ / "lib", std::filesystem::copy_options::recursive);
@@ -83,7 +83,8 @@ TEST_P(ForeignMetaInf, GetsTheVictimsPayloadAndTheVictimsKeyUnderTheAttackersNam
 
 INSTANTIATE_TEST_SUITE_P(Around, ForeignMetaInf, testing::Values("foreign", "no-dex"), NameOf);
 
-// The twin: with one's own META-INF, an attacker gets nothing of the victim's.
+// The counterpart: a package with the attacker's own META-INF gets nothing that belongs to the
+// victim.
 TEST(OwnMetaInf, GetsItsOwnPayload) {
   const std::string apk = Made("keys/rsa-2048-other");
   TempDir directory;

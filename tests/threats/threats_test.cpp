@@ -1,5 +1,5 @@
-// The reach of hostile files through rules that are lenient or trusting on purpose, and its limits.
-// docs/threat-model.md gives the reasons.
+// Tests the effects of hostile files under rules that are lenient or trusting on purpose, and the
+// limits of these effects. docs/threat-model.md explains the reasons.
 #include <sys/mman.h>
 #include <sys/wait.h>
 
@@ -18,7 +18,7 @@ namespace {
 
 // ---- The owner of a package.
 
-// The certificate of the key. Serial numbers tell the certificates apart.
+// A certificate for the key. Serial numbers distinguish the certificates.
 Certificate CertificateOf(const std::string& key, uint64_t serial) {
   Certificate certificate;
   certificate.key = key;
@@ -26,7 +26,7 @@ Certificate CertificateOf(const std::string& key, uint64_t serial) {
   return certificate;
 }
 
-// A package whose block has the certificates and the SignerInfos of two keys, each in this order.
+// A package whose block has the certificates and the SignerInfos of two keys, in these orders.
 Package WithTwoSigners(const Strings& certificates, const Strings& signers) {
   Package package = MakePackage();
   const Bytes signature_file = package.Item("META-INF/CERT.SF").data;
@@ -73,8 +73,8 @@ TEST(Threat, OfTwoSignersTheFirstCertificateAndTheFirstSignatureCount) {
   }
 }
 
-// Four bytes follow the modulus. The exponent's fifth to eighth bytes set its length to the old
-// value: 256, 00 01 00 00 in host byte order. Other readers see a key of 2080 bits.
+// Four bytes follow the modulus. The exponent's fifth to eighth bytes set the length of the modulus
+// to the old value: 256, 00 01 00 00 in host byte order. Other readers see a key of 2080 bits.
 TEST(Threat, AModulusWithJunkBehindItIsTheKeyThatItStartsWith) {
   Package package = MakePackage();
   Certificate certificate;
@@ -87,7 +87,7 @@ TEST(Threat, AModulusWithJunkBehindItIsTheKeyThatItStartsWith) {
   EXPECT_EQ(Device(package).FilesSignedFor("rsa-2048"), Strings({"app/base.apk"}));
 }
 
-// Nothing that is verified tells of a newer package.
+// No verified fact shows that a newer package exists.
 TEST(Threat, AnOlderPackageOfASignerKeepsItsPayload) {
   const Package older = MakePackage();
   PackageOptions options;
@@ -117,7 +117,8 @@ TEST(Threat, DotsInAnEntryNameSignNoFileOutsideWithOtherBytes) {
   EXPECT_EQ(device.FilesSignedFor("rsa-2048"), Strings({"app/base.apk"}));
 }
 
-// The program's name does not end like a library's. The manifest lists its bytes, which are known.
+// The name of the program does not end in ".so". The attacker knows the program's bytes, and the
+// manifest lists their digest.
 void ExpectProgramSigned(const std::function<int(const char* program, const char* name)>& lead) {
   Device device(MakePackage(WithLibrariesNamed({"lib/arm64-v8a/../../../mine/libx.so"})));
   device.Install("lib/arm64/x", {}).Install("../mine/x", {}).Install("../system/program", kLibrary);
@@ -187,7 +188,7 @@ TEST(Threat, LibrariesThatStayInThePackageAreNotCompared) {
   EXPECT_EQ(Device(package).FilesSignedFor("rsa-2048"), Strings({"app/base.apk"}));
 }
 
-// The libraries in the order of the walk.
+// The libraries in the order of the iteration.
 Strings LibrariesWalked(const Package& package) {
   const MemoryFile file(package.Build());
   ApkTools::Apk apk(file.fd());
@@ -200,7 +201,8 @@ Strings LibrariesWalked(const Package& package) {
   return names;
 }
 
-// The library compares the entry's two headers when it reaches the entry, and ends the walk there.
+// The zip library compares an entry's two headers when the iteration reaches the entry. If they
+// differ, it ends the iteration there.
 TEST(Threat, ADamagedLibraryEndsTheWalkAndIntactOnesBehindItStayUnsigned) {
   const Strings names = {"lib/arm64-v8a/liba.so", "lib/arm64-v8a/libb.so", "lib/arm64-v8a/libc.so"};
   const Package intact = MakePackage(WithLibrariesNamed(names));
@@ -257,7 +259,7 @@ TEST(Threat, ALibraryThatIsWrittenToInPlaceAfterItsChecksIsSigned) {
   EXPECT_EQ(BytesSigned(device)[library], "\177ELF Foo");
 }
 
-// A dirty page takes more writes without a change of the times.
+// Further writes to a dirty page do not change the file's times.
 TEST(Threat, ALibraryThatIsWrittenToThroughAMappingAfterItWasReadIsSigned) {
   Device device(MakePackage());
   device.Install("lib/arm64/libfoo.so", kLibrary);
@@ -266,7 +268,7 @@ TEST(Threat, ALibraryThatIsWrittenToThroughAMappingAfterItWasReadIsSigned) {
   void* const mapped = mmap(nullptr, kLibrary.size(), PROT_WRITE, MAP_SHARED, fd, 0);
   ASSERT_NE(mapped, MAP_FAILED);
   volatile char* const bytes = static_cast<char*>(mapped);
-  bytes[5] = 'f';  // as it was
+  bytes[5] = 'f';  // the same value; makes the page dirty
   int opened = 0;
   device.phone.before_open = [&](const char* path, int) {
     opened += library == path;
@@ -302,7 +304,8 @@ TEST(Threat, AJarThatIsWrittenToInPlaceAfterItWasTrustedIsSigned) {
   EXPECT_EQ(BytesSigned(device)[jar][0], 'p');
 }
 
-// The zip library maps the archive's directory. Earlier signatures stay.
+// The zip library maps the archive's central directory, so a read of the lost part raises SIGBUS.
+// Files that were signed before stay signed.
 TEST(Threat, AFileThatShrinksMeanwhileEndsTheProcess) {
   PackageOptions options = WithLibrariesNamed({"lib/arm64-v8a/libfoo.so"});
   for (int i = 0; i < 1000; ++i) options.entries.push_back({"assets/" + std::to_string(i), {}});
