@@ -1,8 +1,8 @@
-# Completion of apktoolkit-sim for bash: options, and what may follow each of them.
+# Bash completion for apktoolkit-sim: its options, their values, and the names of files.
 
 _apktoolkit_sim() {
   local word=${COMP_WORDS[COMP_CWORD]} before=${COMP_WORDS[COMP_CWORD - 1]}
-  # "--option=value" comes as three words.
+  # Bash splits "--option=value" into three words.
   if [[ $word == = ]]; then
     word=
   elif [[ $before == = && $COMP_CWORD -gt 1 ]]; then

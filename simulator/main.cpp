@@ -1,4 +1,4 @@
-// apktoolkit-sim: the phone that apktoolkit runs in, on a workstation.
+// apktoolkit-sim: runs apktoolkit in a simulated phone on a workstation.
 #include <future>
 #include <memory>
 #include <utility>
@@ -25,7 +25,7 @@ struct Answers {
   Judgement judgement;
 };
 
-// The two do not know of each other, and so they work at the same time.
+// The two run at the same time, because neither uses the other's answer.
 Answers Ask(const ListedFile& file, Simulator* simulator, Installer* installer) {
   const FileWatch watch(file.name);
   const bool is_run = file.state == ListedFile::State::kToRun;

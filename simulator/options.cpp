@@ -67,7 +67,7 @@ std::optional<int> ParseOptions(int argc, char** argv, Options* options) {
   CLI::App app(kDescription, "apktoolkit-sim");
   app.footer(kFooter);
   app.get_formatter()->column_width(28);
-  app.allow_extras();  // NameUnknownOption names them
+  app.allow_extras();  // NameUnknownOption reports them
   options->installer.program = ProgramDirectory() + "/../share/apktoolkit/installer.jar";
   std::string runner;
 
@@ -119,8 +119,8 @@ std::optional<int> ParseOptions(int argc, char** argv, Options* options) {
 
 namespace {
 
-// The command line in reverse order, as CLI11 takes it. An --install without a value gets the
-// default value, because CLI11 would take the next word, a file, for its value.
+// The command line in reverse order, as CLI11 expects it. An --install without a value gets the
+// default value, because CLI11 would use the next word, a file, as its value.
 std::vector<std::string> CommandLineOf(int argc, char** argv) {
   std::vector<std::string> words(argv + std::min(argc, 1), argv + argc);
   const auto end_of_options = std::find(words.begin(), words.end(), "--");
@@ -296,7 +296,7 @@ void AddOutput(CLI::App* app, Options* options) {
 }
 
 void AddRun(CLI::App* app, Options* options, std::string* runner) {
-  // "nan" is in every range.
+  // CLI::Range accepts "nan" in every range.
   const auto is_number = [](const std::string& text) {
     return std::isnan(strtod(text.c_str(), nullptr)) ? text + " is not a number" : std::string();
   };
@@ -349,7 +349,7 @@ int MissFile() {
   return kUsageError;
 }
 
-// A script whose variable is not set gives an empty name.
+// The name is empty if a script uses a variable that is not set.
 std::string WhyNoName(const std::string& name) {
   return name.empty() ? "the name is empty" : std::string();
 }

@@ -1,9 +1,9 @@
 // Asks the platform's own verifier (apksig) about packages, as a phone's installer does.
 //
-// Arguments: the first and the last API level of the phones. Standard input has the path of one
-// package a line. Each is answered on standard output by one line, a JSON object in ASCII. The
-// program ends with its input. docs/journal.md describes the ranges of API levels; an object with
-// "failure" says why the verifier has no answer.
+// Arguments: the first and the last API level of the phones. Standard input: the paths of packages,
+// one per line. The answer to each path is one line on standard output, a JSON object in ASCII. The
+// program ends at the end of its input. The object has the answers for ranges of API levels
+// (docs/journal.md), or "failure", the reason why the verifier has no answer.
 
 import com.android.apksig.ApkVerifier;
 import com.android.apksig.apk.ApkFormatException;
@@ -30,25 +30,26 @@ import java.util.SortedSet;
 import java.util.TreeSet;
 
 public final class InstallerVerifier {
-    // The levels at which the platform's rules change: 28 reads v3, 30 asks for v2 where an app
-    // targets it, 33 reads v3.1.
+    // The levels at which the rules change. The platform reads v3 from 28 on, requires v2 from 30
+    // on if the app targets 30 or later, and reads v3.1 from 33 on.
     private static final int KNOWS_V3 = 28;
     private static final int ASKS_FOR_V2 = 30;
     private static final int KNOWS_V31 = 33;
     private static final List<Integer> NEW_RULES = List.of(KNOWS_V3, ASKS_FOR_V2, KNOWS_V31);
 
-    // Of each kind, so many errors, warnings and signers are told, and so much of a text.
+    // The limits of an answer: the number of errors, of warnings and of signers for a range, and
+    // the number of characters of a text.
     private static final int MOST = 100;
     private static final int LONGEST_TEXT = 1000;
 
-    // As in the names of apksig's methods, and as people call the schemes.
+    // The names of the schemes: in the methods of apksig, and in answers.
     private static final String[][] SCHEMES = {{"V1", "v1"}, {"V2", "v2"}, {"V3", "v3"},
         {"V31", "v3.1"}};
 
     public static void main(String[] arguments) throws Exception {
         int first = Integer.parseInt(arguments[0]);
         int last = Integer.parseInt(arguments[1]);
-        // Nothing else may write to what the answers go to.
+        // Only answers may be written to standard output. All other output is dropped.
         PrintStream answers = System.out;
         System.setOut(new PrintStream(OutputStream.nullOutputStream()));
         BufferedReader paths =
@@ -59,7 +60,7 @@ public final class InstallerVerifier {
         }
     }
 
-    // A file that the verifier has no answer for must not end the answers for the others.
+    // A failure of the verifier for one file must not end the answers for the other files.
     private static String answer(File file, int first, int last) {
         try (RandomAccessFile opened = new RandomAccessFile(file, "r")) {
             DataSource source = DataSources.asDataSource(opened);
@@ -75,7 +76,7 @@ public final class InstallerVerifier {
         }
     }
 
-    // Below it no phone installs the package; 1 where that cannot be read.
+    // The lowest level at which phones install the package; 1 if it cannot be read.
     private static int lowestLevel(DataSource source) {
         try {
             return ApkUtils.getMinSdkVersionFromBinaryAndroidManifest(
@@ -85,10 +86,10 @@ public final class InstallerVerifier {
         }
     }
 
-    // The verifier answers for all levels of a range at once, and then names one signer for them. So
-    // a package with v3 is verified for 27 and for later levels apart, and at each level at which
-    // one of its v3 signers begins or ends. Other packages are verified for all levels at once, and
-    // only where that is refused, for those of equal rules each by itself.
+    // The verifier answers for all levels of a range at once, and names one signer for all of them.
+    // For a package with v3 or v3.1, the levels are therefore split where the scheme begins, and
+    // where one of its signers begins or ends. For other packages, all levels are one range. If a
+    // range is refused, the levels are also split at NEW_RULES, and all ranges are verified again.
     private static String ranges(DataSource source, int first, int last) throws Exception {
         SortedSet<Integer> starts = new TreeSet<>();
         boolean hasNewer = NewerSigners.read(source, starts);
@@ -98,8 +99,8 @@ public final class InstallerVerifier {
             starts.addAll(NEW_RULES);
             ranges = verifyEach(source, first, last, starts, hasNewer);
         }
-        // The lineage must lead from the signers of earlier phones to those of later phones. The
-        // verifier checks that only for all levels together.
+        // The lineage must lead from the signers for earlier levels to the signers for later
+        // levels. The verifier checks this only if it verifies all levels together.
         if (!isRefused && hasNewer) {
             Range whole = verify(source, first, last, hasNewer);
             if (!whole.isVerified) {
@@ -113,7 +114,7 @@ public final class InstallerVerifier {
         return list(told);
     }
 
-    // One range from each start to the next.
+    // Verifies the levels from each start to the next one as one range.
     private static List<Range> verifyEach(DataSource source, int first, int last,
             SortedSet<Integer> starts, boolean hasNewer) throws Exception {
         List<Range> ranges = new ArrayList<>();
@@ -130,7 +131,7 @@ public final class InstallerVerifier {
         }
     }
 
-    // Neighbours of which the same is said are one range.
+    // Appends the range. If the range before it has the same answer, the two become one range.
     private static void add(Range range, List<Range> ranges) {
         Range before = ranges.isEmpty() ? null : ranges.get(ranges.size() - 1);
         if (before != null && before.said.equals(range.said)) {
@@ -140,7 +141,7 @@ public final class InstallerVerifier {
         }
     }
 
-    // Phones go by a scheme that this version of the verifier does not know.
+    // Phones verify the package by a scheme that this version of apksig does not know.
     private static final class UnknownScheme extends Exception {
         private static final long serialVersionUID = 1;
 
@@ -154,7 +155,7 @@ public final class InstallerVerifier {
         final int first;
         int last;
         boolean isVerified;
-        String said;  // members of an object
+        String said;  // the answer, as members of a JSON object
 
         Range(int first, int last) {
             this.first = first;
@@ -167,9 +168,10 @@ public final class InstallerVerifier {
         }
     }
 
-    // Phones of API 30 and later ask for v2 where an app targets 30 or more. The verifier asks for it
-    // only where the range reaches up to the target, so its range has no end there. That changes
-    // nothing else where no signer is for some levels alone.
+    // Phones of API 30 and later require v2 if the app targets 30 or later. The verifier checks
+    // this only if the range includes the app's target level. A range that ends at 30 or later is
+    // therefore verified without an upper end. This changes no other answer. Packages with v3 or
+    // v3.1 are an exception, because their signers may be for some levels only.
     private static Range verify(DataSource source, int first, int last, boolean hasNewer)
             throws Exception {
         if (first >= KNOWS_V31 && !hasMethod(ApkVerifier.Result.class, "isVerifiedUsingV31Scheme")
@@ -205,7 +207,7 @@ public final class InstallerVerifier {
             }
             malformed.add(issue("MALFORMED_APK", new Object[0], exception.getMessage()));
         } catch (RuntimeException exception) {
-            // So the verifier says that nothing in the package is for these levels.
+            // The verifier throws this if no signature of the package is for these levels.
             if (!String.valueOf(exception.getMessage()).startsWith("APK verified, but has not")) {
                 throw exception;
             }
@@ -218,7 +220,7 @@ public final class InstallerVerifier {
         return range;
     }
 
-    // Whether the file could be read, and an entry's data are longer than the entry says.
+    // True if the file could be read, but the data of an entry are longer than the entry states.
     private static boolean isOfDamagedData(Throwable failure) {
         for (Throwable cause = failure; cause != null; cause = cause.getCause()) {
             if (cause instanceof BufferOverflowException) {
@@ -228,8 +230,8 @@ public final class InstallerVerifier {
         return false;
     }
 
-    // Adds the result's answers for one scheme. Older generations of apksig do not know all
-    // schemes, so the methods are looked for by their names.
+    // Adds the result's answers for one scheme. Older versions of apksig do not know all schemes,
+    // so the methods are looked up by name.
     private static void describe(ApkVerifier.Result result, String[] scheme, List<String> schemes,
             List<String> signers, List<Object> errors, List<Object> warnings) throws Exception {
         boolean isVerified;
@@ -288,8 +290,9 @@ public final class InstallerVerifier {
         return object("issue", text(name), "parameters", list(texts), "text", text(words));
     }
 
-    // The signers of v3 and v3.1 in the signing block, which are each for a range of levels. Nothing
-    // is verified. A block that is malformed has no signers here; the verifier says what is wrong.
+    // The signers of v3 and v3.1 in the signing block. Each of them is for a range of levels.
+    // Nothing is verified here. A malformed block has no signers here, and the verifier reports the
+    // error.
     private static final class NewerSigners {
         private static final int V3 = 0xf05368c0;
         private static final int V31 = 0x1b93ad61;
@@ -297,8 +300,8 @@ public final class InstallerVerifier {
         private static final int MOST_BYTES = 16 << 20;
         private static final int MOST_SIGNERS = 100;
 
-        // Adds the levels at which one of them begins, or has just ended, and says whether there
-        // are any.
+        // Adds the first level of each scheme and of each signer, and the level after each signer's
+        // last one. Returns true if the package has one of the two schemes.
         static boolean read(DataSource source, SortedSet<Integer> starts) {
             boolean hasAny = false;
             for (int id : new int[] {V3, V31}) {
@@ -316,7 +319,8 @@ public final class InstallerVerifier {
             return find(source, V31) != null;
         }
 
-        // A signer is: length, signed data with its length, first level, last level, and more.
+        // The fields of a signer: its length, signed data with their length, first level, last
+        // level, and more.
         private static void addLevels(ByteBuffer value, SortedSet<Integer> starts) {
             try {
                 ByteBuffer signers = take(value);
@@ -333,15 +337,15 @@ public final class InstallerVerifier {
             }
         }
 
-        // Beyond the levels of any phone a range has no end.
+        // Ignores levels that no phone has. Such a level means that the range has no end.
         private static void addLevel(long level, SortedSet<Integer> starts) {
             if (level > 0 && level < NO_PHONES_LEVEL) {
                 starts.add((int) level);
             }
         }
 
-        // The value of the block's first pair of that ID, or null. A pair is: a length of 8 bytes, an
-        // ID of 4, and the value.
+        // The value of the block's first pair with this ID, or null. The fields of a pair: a length
+        // of 8 bytes, an ID of 4 bytes, and the value.
         private static ByteBuffer find(DataSource source, int wanted) {
             try {
                 ApkUtils.ZipSections sections = ApkUtils.findZipSections(source);
@@ -371,7 +375,7 @@ public final class InstallerVerifier {
             return slice(bytes, bytes.getInt());
         }
 
-        // The next bytes of the buffer, which then stands behind them.
+        // Returns the next bytes of the buffer, and moves its position behind them.
         private static ByteBuffer slice(ByteBuffer bytes, int length) {
             ByteBuffer part = bytes.slice().order(ByteOrder.LITTLE_ENDIAN);
             part.limit(length);
@@ -380,7 +384,7 @@ public final class InstallerVerifier {
         }
     }
 
-    // ---- JSON: values are texts of JSON already.
+    // ---- JSON. The values that `object`, `members` and `list` get are already JSON texts.
 
     private static String object(String... members) {
         return "{" + members(members) + "}";
@@ -398,7 +402,7 @@ public final class InstallerVerifier {
         return "[" + String.join(",", values) + "]";
     }
 
-    // Names in it come from the file, and need not be good UTF-16.
+    // The text may contain names from the file, which need not be valid UTF-16.
     private static String text(String words) {
         String all = words == null ? "" : words;
         StringBuilder json = new StringBuilder("\"");

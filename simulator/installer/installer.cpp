@@ -20,7 +20,7 @@ namespace simulator {
 
 namespace {
 
-// The library that verifies, as Debian installs it.
+// The path of apksig, the library that verifies.
 constexpr char kVerifierLibrary[] = APKTOOLKIT_APKSIG;
 constexpr char kClass[] = "InstallerVerifier";
 
@@ -45,7 +45,8 @@ std::optional<std::string> Installer::Missing() const {
   return {};
 }
 
-// The other process opens what this one has open, so that a name may have any bytes.
+// The Java program opens the file by the path of this process's descriptor, because the file's own
+// name may contain any bytes, such as a line feed.
 Judgement Installer::Judge(const std::string& file) {
   if (options_.use == InstallerUse::kOff) return {};
   const ScopedFd opened(open(file.c_str(), O_RDONLY | O_CLOEXEC | O_NONBLOCK | O_NOCTTY));
@@ -62,7 +63,7 @@ Judgement Installer::Ask(const std::string& path) {
   if (Send(pipe_->get(), path + "\n") && Receive(pipe_->get(), deadline, &answer)) {
     return ParseJudgement(answer);
   }
-  Stop();  // the next package gets another process
+  Stop();  // the next package starts a new process
   if (IsInterrupted()) return GaveUp("it was interrupted");
   if (!deadline.HasPassed()) return GaveUp("it ended");
   std::ostringstream seconds;
@@ -70,7 +71,7 @@ Judgement Installer::Ask(const std::string& path) {
   return GaveUp(seconds.str());
 }
 
-// A socket, since writing to one whose other side has died need not end this process.
+// Uses a socket and not a pipe, because send() can suppress SIGPIPE if the Java program has ended.
 bool Installer::Start() {
   int ends[2];
   if (socketpair(AF_UNIX, SOCK_STREAM | SOCK_CLOEXEC, 0, ends) != 0) return false;
@@ -121,7 +122,7 @@ bool HasProgram(const std::string& name) {
   return false;
 }
 
-// As the tool sees it.
+// True if the file is a package for the tool: an archive with AndroidManifest.xml.
 bool IsPackage(int fd) {
   struct stat state = {};
   if (fstat(fd, &state) != 0 || !S_ISREG(state.st_mode)) return false;
@@ -139,7 +140,8 @@ bool Send(int fd, std::string_view bytes) {
   return true;
 }
 
-// One line, without its end.
+// Receives one line, without its line feed. Returns false if the line does not end before the
+// deadline.
 bool Receive(int fd, const Deadline& deadline, std::string* line) {
   constexpr int kNowAndThen = 100;  // milliseconds
   constexpr size_t kLongest = 64 << 20;
@@ -147,7 +149,7 @@ bool Receive(int fd, const Deadline& deadline, std::string* line) {
   while (line->size() < kLongest && !deadline.HasPassed()) {
     pollfd waiting = {fd, POLLIN, 0};
     if (poll(&waiting, 1, kNowAndThen) <= 0) continue;
-    // The files are judged one after the other: the lock is there to wait for this answer.
+    // The caller holds its lock during this wait on purpose: files are judged one after the other.
     // NOLINTNEXTLINE(clang-analyzer-unix.BlockInCriticalSection)
     const ssize_t size = recv(fd, part.data(), part.size(), 0);
     if (size <= 0) return false;

@@ -1,6 +1,6 @@
 // The installer of the phones: the platform's own verifier, apksig, in a Java program
-// (InstallerVerifier.java). One process of it serves a whole run. It is started when the first
-// package comes, and again when it did not survive one.
+// (InstallerVerifier.java). One process of this program judges all packages of a run. It is started
+// for the first package. If it fails on a package, the next package starts a new process.
 #pragma once
 
 #include <sys/types.h>
@@ -15,14 +15,15 @@
 
 namespace simulator {
 
-// When the installer is asked: if it is there, in any case, or never.
+// kAuto: the installer is asked if its verifier is installed. kRequired: without the verifier, the
+// run fails. kOff: the installer is never asked.
 enum class InstallerUse { kAuto, kRequired, kOff };
 
 struct InstallerOptions {
   InstallerUse use = InstallerUse::kAuto;
-  LevelRange levels = {27, kNewestLevel};  // the phones that are asked about
+  LevelRange levels = {27, kNewestLevel};  // the phones whose installer is asked
   double timeout = 30;                     // seconds, for each file
-  std::string program;                     // the path of InstallerVerifier, in its JAR
+  std::string program;                     // the path of the JAR with InstallerVerifier
 };
 
 class Installer {
@@ -34,11 +35,11 @@ class Installer {
   Installer(const Installer&) = delete;
   Installer& operator=(const Installer&) = delete;
 
-  // Why nothing can be asked, with what to install; none when it can.
+  // Returns why the installer cannot be asked, and what to install; none if it can be asked.
   std::optional<std::string> Missing() const;
 
   // Asks the phones' installer about the file. The result is kNotAsked for a file that is not a
-  // package. Several threads may ask; they are answered one after the other.
+  // package. Several threads may call it; the packages are judged one after the other.
   Judgement Judge(const std::string& file);
 
  private:
@@ -47,8 +48,8 @@ class Installer {
   void Stop();
 
   const InstallerOptions& options_;
-  std::mutex mutex_;              // of all below
-  std::optional<ScopedFd> pipe_;  // both ways; none: the process does not run
+  std::mutex mutex_;              // protects the members below
+  std::optional<ScopedFd> pipe_;  // for both directions; none: the process does not run
   pid_t process_ = -1;
 };
 

@@ -46,7 +46,7 @@ namespace {
 
 Judgement NoAnswer(const std::string& why) { return {Judgement::State::kGaveUp, why, {}}; }
 
-// A package that is verified has a signer, and one that is not has an error that says why.
+// A verified package must have a signer and no error. Any other package must have an error.
 bool ReadRange(const Json& json, RangeJudgement* range) {
   if (!json.is_object()) return false;
   const auto first = json.find("first"), last = json.find("last"), verified = json.find("verified");
@@ -107,14 +107,14 @@ std::optional<std::string> FromHex(const std::string& digits) {
   return bytes;
 }
 
-// Empty when the object has no text of that name.
+// Returns an empty text if the object has no text with this name.
 std::string TextOf(const Json& json, const char* key) {
   if (!json.is_object()) return {};
   const auto text = json.find(key);
   return text != json.end() && text->is_string() ? text->get<std::string>() : std::string();
 }
 
-// Null when the object has no list of that name.
+// Returns null if the object has no list with this name.
 const Json* ListOf(const Json& json, const char* key) {
   if (!json.is_object()) return nullptr;
   const auto list = json.find(key);

@@ -1,6 +1,6 @@
-// The judgement of the platform's own verifier: whether the installer of a phone takes a package.
-// The answers are texts of another program about a hostile file. Each is read with care, and a
-// malformed one counts as no answer.
+// The judgement of the platform's own verifier: whether a phone's installer installs the package.
+// The answers come from another program that has read a hostile file. A malformed answer counts as
+// no answer.
 #pragma once
 
 #include <climits>
@@ -27,13 +27,13 @@ struct InstallerIssue {
   std::string text;  // apksig's own sentence
 };
 
-// A signer of one scheme that verified.
+// A signer of one verified scheme.
 struct InstallerSigner {
   std::string scheme;  // "v1", "v2", "v3" or "v3.1"
   CertificateFacts certificate;
 };
 
-// The judgement of the phones of some levels.
+// The judgement of the phones with these API levels.
 struct RangeJudgement {
   LevelRange levels = {0, 0};
   bool is_verified = false;
@@ -52,11 +52,11 @@ struct Judgement {
   };
 
   State state = State::kNotAsked;
-  std::string why;                     // of kMissing and kGaveUp
+  std::string why;                     // the reason, for kMissing and kGaveUp
   std::vector<RangeJudgement> ranges;  // sorted by level; neighbours have different judgements
 };
 
-// The answer in one line of the verifier: kJudged or kGaveUp.
+// Parses one line of the verifier. The result's state is kJudged or kGaveUp.
 Judgement ParseJudgement(const std::string& line);
 
 }  // namespace simulator

@@ -38,8 +38,8 @@ AndroidManifest ParseAndroidManifest(const std::vector<uint8_t>& bytes) {
 
 namespace {
 
-// The parser keeps a copy of each UTF-8 string that it is asked for. Overlapping strings together
-// can be many times as long as the document.
+// The parser keeps a copy of each UTF-8 string that it returns. The copies of overlapping strings
+// together can be many times as long as the document.
 bool HasOverlaps(const android::ResStringPool& strings, size_t document_size) {
   uint64_t length = 0;
   for (size_t i = 0; strings.isUTF8() && i < strings.size(); ++i) {
@@ -69,7 +69,7 @@ void ReadAsInstaller(ResXMLParser* parser, AndroidManifest* manifest) {
   }
 }
 
-// Takes the attribute in any namespace, as installers do.
+// Accepts the attribute in any namespace, as installers do.
 std::optional<bool> ExtractsLibraries(const ResXMLParser& application) {
   std::optional<bool> extracts;
   for (size_t i = 0; i < application.getAttributeCount(); ++i) {

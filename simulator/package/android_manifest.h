@@ -1,5 +1,6 @@
-// A compiled AndroidManifest.xml, as the tool reads it and as the phone's installer does. The two
-// follow different rules, so a package can have one name for each of them.
+// A compiled AndroidManifest.xml, read by the rules of the tool and by the rules of the phone's
+// installer. The rules differ, so a package can have two names: one for the tool, and one for the
+// installer.
 #pragma once
 
 #include <cstdint>
@@ -13,7 +14,7 @@ struct AndroidManifest {
   // The strings of the document overlap. The platform's parser would use many times the size of
   // the document, so the document is not read.
   bool has_overlaps = false;
-  // The package's name by the tool's own reader; none if it cannot read the document.
+  // The package's name as the tool's own code reads it; none if it cannot read the document.
   std::optional<std::string> package_name;
   // The package's name by the installer's rules: the root's attribute "package" without a
   // namespace. UTF-8, up to the first NUL.

@@ -15,13 +15,13 @@ constexpr int32_t kNoMoreEntries = -1;
 
 void SilenceTheLog() {
   [[maybe_unused]] static const bool done = [] {
-    // A logger's parameters are others in each generation of the log library.
+    // The parameters of a logger differ between the generations of the log library.
     __android_log_set_logger([](auto...) {});
     return true;
   }();
 }
 
-// A name that no archive can hold is not there either.
+// A name that is invalid in every archive also counts as missing.
 bool IsMissing(int32_t result) {
   return result == ApkTools::kZipEntryNotFound || result == ApkTools::kZipInvalidEntryName;
 }
@@ -54,7 +54,7 @@ ArchiveWalk Archive::Walk(const EntryNames& names) const {
   ArchiveWalk walk;
   void* cookie = nullptr;
   if (ApkTools::StartZipIteration(handle_, &cookie, names.prefix, names.suffix) != 0) return walk;
-  bool has_ended = false;  // for the tool
+  bool has_ended = false;  // the tool's walk ends at the first error
   ZipEntry entry;
   std::string name;
   int32_t result;

@@ -39,8 +39,8 @@ inline constexpr EntryNames kSignatureFileNames = {"META-INF/", ".SF"};
 
 // The entries of one kind, in the order in which the tool meets them.
 struct ArchiveWalk {
-  std::vector<std::string> names;  // of all but the damaged ones
-  // How many of them the tool meets. Its walk ends at the first entry that is damaged.
+  std::vector<std::string> names;  // without those of damaged entries
+  // The number of them that the tool's walk reaches. The walk ends at the first damaged entry.
   size_t met = 0;
 };
 
@@ -54,9 +54,9 @@ class Archive {
 
   enum class ReadResult { kRead, kMissing, kDamaged, kTooLong };
 
-  // Opens the archive behind `fd`. The caller owns `fd` and keeps it open while this object exists.
-  // `result` is the library's code, 0 for success. If it is not 0, no other function may be called.
-  // Only one thread may use the object.
+  // Opens the archive in the open file `fd`. The caller owns `fd` and keeps it open while this
+  // object exists. `result` is the library's code, 0 for success. If it is not 0, no other function
+  // may be called. Only one thread may use the object.
   Archive(int fd, int32_t* result);
   ~Archive();
   Archive(const Archive&) = delete;

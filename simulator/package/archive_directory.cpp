@@ -21,7 +21,8 @@ std::optional<ArchiveEnd> FindArchiveEnd(int fd) {
   const size_t at = tail.size() < kRecordSize ? std::string::npos
                                               : tail.rfind(kMark, tail.size() - kRecordSize, 4);
   if (at == std::string::npos) return {};
-  // Mark, two disk numbers, entries on this disk, entries, the directory's size and its offset.
+  // The fields of the record: signature, two disk numbers, the number of entries on this disk, the
+  // number of all entries, the directory's size and its offset.
   CBS record = ToCbs(std::string_view(tail).substr(at));
   ArchiveEnd end = {};
   const bool is_read = CBS_skip(&record, 10) != 0 &&
@@ -38,8 +39,8 @@ std::vector<ArchiveEntry> ReadDirectory(int fd, const ArchiveEnd& end) {
   while (entries.size() < end.entry_count) {
     const std::string record = ReadAt(fd, offset, kRecordSize);
     constexpr uint16_t kEncrypted = 1;  // APPNOTE.TXT 4.4.4, bit 0
-    // Mark, two versions, flags, ten bytes, the two sizes, the lengths of the three parts behind
-    // the record.
+    // The fields of the record: signature, two versions, flags, ten other bytes, the two sizes, and
+    // the lengths of the three parts that follow the record.
     CBS fields = ToCbs(record);
     uint32_t size = 0;
     uint16_t flags = 0;

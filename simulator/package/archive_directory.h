@@ -1,6 +1,6 @@
-// The central directory of a zip archive and the record behind it, read record by record
-// (APPNOTE.TXT 4.3.12 and 4.3.16). The platform's library passes over an entry that it finds
-// damaged without its name; here it has one.
+// The central directory of a zip archive and the end record after it (APPNOTE.TXT 4.3.12 and
+// 4.3.16). The platform's library skips a damaged entry and does not report its name. This reader
+// has the names of all entries.
 #pragma once
 
 #include <cstdint>
@@ -12,26 +12,28 @@ namespace simulator {
 
 struct ArchiveEnd {
   uint16_t entry_count;
-  // Of the central directory, as the record has it: maybe beyond the file.
+  // The offset of the central directory, as the record states it. May be beyond the end of the
+  // file.
   uint32_t directory_offset;
 };
 
 // One entry, as the directory describes it.
 struct ArchiveEntry {
   std::string name;  // any bytes
-  uint64_t size;     // what its data takes in the archive, in bytes
+  uint64_t size;     // of its compressed data, in bytes
   bool is_damaged;   // the platform's library does not find it
   bool is_encrypted = false;
 };
 
-// The end record of the file that is open as `fd`, by the last of its marks; none when it has none.
+// Finds the end record of the open file `fd`. If several byte sequences look like one, the last one
+// counts. None if the file has no end record.
 std::optional<ArchiveEnd> FindArchiveEnd(int fd);
 
-// The entries that the directory names, in its order, none of them damaged as far as it knows;
-// those before the first record that does not read.
+// Returns the entries in the order of the directory. Ends at the first malformed record. The
+// directory does not show damaged data, so `is_damaged` is false in all results.
 std::vector<ArchiveEntry> ReadDirectory(int fd, const ArchiveEnd& end);
 
-// `size` bytes of the file from `offset` on, or as many as there are.
+// Reads `size` bytes of the file from `offset` on. Returns fewer if the file does not have so many.
 std::string ReadAt(int fd, uint64_t offset, size_t size);
 
 }  // namespace simulator

@@ -1,4 +1,4 @@
-// Bytes that nobody vouches for, as libcrypto's reader takes them; it never leaves them.
+// Untrusted bytes as input for CBS, libcrypto's reader. It never reads beyond their end.
 #pragma once
 
 #include <openssl/bytestring.h>

@@ -109,7 +109,8 @@ PublicKey ReadKey(X509* certificate) {
   const int size = i2d_X509_PUBKEY(info, &der);
   const bssl::UniquePtr<uint8_t> owner(der);
   key.sha256 = Sha256Hex(Text(der, size));
-  // None for a key that the library does not take, such as one on another curve.
+  // The result is null for a key that the library does not support, such as a key on an unknown
+  // curve.
   const bssl::UniquePtr<EVP_PKEY> parsed(X509_get_pubkey(certificate));
   if (parsed == nullptr) return key;
   key.bits = EVP_PKEY_bits(parsed.get());
@@ -121,7 +122,7 @@ PublicKey ReadKey(X509* certificate) {
   return key;
 }
 
-// The library compares times of both forms.
+// The library compares both forms of time, UTCTime and GeneralizedTime.
 std::optional<int64_t> SecondsOf(const ASN1_TIME* time) {
   constexpr int64_t kSecondsOfDay = 86'400;
   const bssl::UniquePtr<ASN1_TIME> start(ASN1_TIME_set(nullptr, 0));
@@ -131,8 +132,9 @@ std::optional<int64_t> SecondsOf(const ASN1_TIME* time) {
   return days * kSecondsOfDay + seconds;
 }
 
-// The last first; of one RelativeDistinguishedName, which mostly is one attribute, in their order.
-// Names with more attributes are cut; real ones have ten at most.
+// Writes the RelativeDistinguishedNames in reverse order, and the attributes inside each of them in
+// their own order. Names with more than kMostAttributes attributes are cut. Real names have at most
+// ten.
 std::string NameText(const X509_NAME* name) {
   constexpr int kMostAttributes = 256;
   std::string text, part;
@@ -149,9 +151,9 @@ std::string NameText(const X509_NAME* name) {
   return text;
 }
 
-// The library would print the whole name as well, but with keywords of its own, and people look for
-// the JDK's. The value is the library's work: in quotation marks where special characters ask for
-// them, and as hexadecimal digits where it is not a text.
+// The library could print the whole name, but its keywords differ from the JDK's, for which people
+// search. The library prints only the value: in quotation marks if it has special characters, and
+// as hexadecimal digits if it is not a text.
 std::string AttributeText(const X509_NAME_ENTRY* attribute) {
   constexpr unsigned long kFlags = ASN1_STRFLGS_ESC_2253 | ASN1_STRFLGS_ESC_QUOTE |
                                    ASN1_STRFLGS_UTF8_CONVERT | ASN1_STRFLGS_DUMP_UNKNOWN |
@@ -170,7 +172,7 @@ std::string AttributeText(const X509_NAME_ENTRY* attribute) {
   return text + "=" + Text(value, static_cast<int>(size));
 }
 
-// The JDK's names of the three kinds that sign packages.
+// Uses the JDK's names for the three kinds of keys that sign packages.
 std::string KeyKind(const ASN1_OBJECT* algorithm) {
   const AlgorithmFacts facts = AlgorithmOf(algorithm);
   if (facts.nid == NID_rsaEncryption) return "RSA";
@@ -178,7 +180,7 @@ std::string KeyKind(const ASN1_OBJECT* algorithm) {
   return facts.nid == NID_dsa ? "DSA" : facts.name;
 }
 
-// As keytool's -sigalg takes it: digest "with" key.
+// Has the form of keytool's -sigalg, such as "SHA256withRSA".
 std::string SignatureName(const ASN1_OBJECT* algorithm) {
   int digest = NID_undef;
   int key = NID_undef;
@@ -198,7 +200,7 @@ std::string IssuerAndSerial(const X509* certificate) {
   return Text(issuer, static_cast<int>(issuer_size)) + Text(serial, serial_size);
 }
 
-// Nothing for a size below 0, which is how the library tells a failure.
+// Returns an empty text if `size` is negative, by which the library reports a failure.
 std::string Text(const uint8_t* bytes, int size) {
   if (size <= 0) return {};
   return {reinterpret_cast<const char*>(bytes), static_cast<size_t>(size)};

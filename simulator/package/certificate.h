@@ -1,5 +1,5 @@
-// Certificates, in the forms in which people compare them: those that `apksigner verify
-// --print-certs` prints. Read by the platform's crypto library; nothing is verified.
+// The facts of certificates, in the forms that people compare: those that `apksigner verify
+// --print-certs` prints. The platform's crypto library reads the certificates. Nothing is verified.
 #pragma once
 
 #include <openssl/sha.h>
@@ -13,10 +13,10 @@
 namespace simulator {
 
 struct PublicKey {
-  std::string algorithm;  // "RSA", "EC" or "DSA"; else as the library names it
+  std::string algorithm;  // "RSA", "EC" or "DSA"; else the library's name
   int bits = 0;           // 0: not known
-  std::string sha256;     // of the SubjectPublicKeyInfo, in lower-case hexadecimal, as all digests
-  // Of the modulus without leading zeros; empty where the library reads no RSA key.
+  std::string sha256;     // of the SubjectPublicKeyInfo; digests are in lower-case hexadecimal
+  // Of the modulus without leading zeros; empty if the library cannot read an RSA key.
   std::string modulus_sha256;
 };
 
@@ -26,11 +26,11 @@ struct CertificateFacts {
   std::string issuer;
   bool is_self_issued = false;  // issuer and subject are the same name
   std::string sha256;           // of the whole certificate
-  std::string sha1;             // of the same, for stores that name a signer by it
+  std::string sha1;             // of the whole certificate, for stores that name a signer by it
   // The algorithm of the certificate's own signature, such as "SHA384withRSA".
   std::string signature_algorithm;
   bool has_known_digest = false;  // it is signed with RSA PKCS#1 v1.5 over MD5, SHA-1 or SHA-256
-  // The last second at which it is valid, counted since 1970 in UTC; none: it does not read.
+  // The last second at which it is valid, counted since 1970 in UTC; none: it cannot be read.
   std::optional<int64_t> not_after;
   PublicKey key;
   // The contents of the two SignerIdentifiers by which a signature can name the certificate: issuer
@@ -39,28 +39,28 @@ struct CertificateFacts {
   std::string key_id;
 };
 
-// The certificate at the start of the bytes; none when the bytes do not begin with one.
+// Parses the certificate at the start of `der`. None if `der` does not start with a certificate.
 std::optional<CertificateFacts> ParseCertificate(std::string_view der);
 
 struct AlgorithmFacts {
-  int nid = 0;       // the library's number for it; 0: it knows none
-  std::string name;  // as the library has it, such as "SHA256"; else the object identifier
+  int nid = 0;       // the library's number for it; 0: the library has none
+  std::string name;  // the library's name, such as "SHA256"; else the object identifier
 };
 
 AlgorithmFacts AlgorithmOf(const ASN1_OBJECT* algorithm);
-// Of an AlgorithmIdentifier; nothing where it does not read.
+// Parses an AlgorithmIdentifier. The result is empty if it is malformed.
 AlgorithmFacts ParseAlgorithm(std::string_view der);
 
 // The digest in lower-case hexadecimal.
 std::string Sha1Hex(std::string_view bytes);
 std::string Sha256Hex(std::string_view bytes);
 
-// The same of bytes that come in parts.
+// The SHA-256 digest of bytes that are added in parts.
 class Sha256 {
  public:
   Sha256() { SHA256_Init(&state_); }
   void Add(std::string_view bytes) { SHA256_Update(&state_, bytes.data(), bytes.size()); }
-  // To be called once, after the last part.
+  // Call it once, after the last part.
   std::string Hex();
 
  private:

@@ -31,7 +31,7 @@ PackageEntries CompareEntries(Archive* archive, std::vector<uint8_t> manifest,
   EntryDigests digests;
   digests.Load(manifest);
   digests.List();
-  Apk tool(-1);  // without a file; it is asked whether a digest is the right one
+  Apk tool(-1);  // without a file; it only compares digests
   PackageEntries entries;
   std::string digest_name, digest;
   for (ArchiveEntry& entry : archive->Entries()) {
@@ -67,21 +67,22 @@ EntryDigest Compare(Archive* archive, const EntryDigests& manifest, const Archiv
   return IsKnownDigest(digest_name, tool) ? EntryDigest::kDiffers : EntryDigest::kNotCompared;
 }
 
-// The tool then finds that of no bytes right.
+// True if the tool accepts the SHA-1 digest of no bytes under this name.
 bool IsSha1Digest(const std::string& name, Apk* tool) {
   std::vector<uint8_t> sha1;
   ComputeSHA1Digest({}, sha1);
   return tool->VerifyData(name, sha1, {});
 }
 
-// Whether the tool reads digests of this name: it then finds one of its two right for no bytes.
+// True if the tool reads digests with this name. It then accepts the SHA-1 or the SHA-256 digest of
+// no bytes.
 bool IsKnownDigest(const std::string& name, Apk* tool) {
   std::vector<uint8_t> sha256;
   ComputeSHA256Digest({}, sha256);
   return IsSha1Digest(name, tool) || tool->VerifyData(name, sha256, {});
 }
 
-// The manifest, signature files and their blocks, which no manifest lists.
+// True for the manifest, signature files and their blocks. A manifest does not list these entries.
 bool IsSignatureName(const std::string& name) {
   constexpr std::string_view kDirectory = "META-INF/";
   if (name == Apk::kMANIFEST_MF) return true;
@@ -91,7 +92,7 @@ bool IsSignatureName(const std::string& name) {
          EndsWith(name, ".DSA");
 }
 
-// In the order of the manifest, each once.
+// Returns the names in the order of the manifest, each once.
 std::vector<std::string> FindMissing(std::vector<uint8_t> text, const EntryDigests& manifest,
                                      const std::vector<ListedEntry>& entries) {
   std::unordered_set<std::string> known;

@@ -1,5 +1,6 @@
 // The entries of a package, each compared with its digest in the manifest. The tool's own code
-// finds the digest for a name and compares it. The tool itself looks at few entries.
+// finds the digest for a name and compares it. In its own run, the tool compares only a few of the
+// entries.
 #pragma once
 
 #include <cstdint>
@@ -13,7 +14,7 @@ namespace simulator {
 
 // The answer of the tool's code for an entry and its digest in the manifest.
 enum class EntryDigest {
-  kUnlisted,  // the manifest has none
+  kUnlisted,  // the manifest has no digest for it
   kMatches,
   kDiffers,
   kNotCompared,  // the entry cannot be read or is too long, the tool does not know the kind of its
@@ -23,7 +24,7 @@ enum class EntryDigest {
 struct ListedEntry {
   ArchiveEntry entry;
   bool is_listed;     // the manifest has a digest for it
-  bool is_signature;  // it belongs to a JAR signature itself
+  bool is_signature;  // it is a part of the JAR signature itself
   EntryDigest digest = EntryDigest::kUnlisted;
   bool has_sha1 = false;  // the digest that the tool would compare is a SHA-1 digest
 };

@@ -21,8 +21,8 @@ namespace simulator {
 
 namespace {
 
-// Opening does not wait for a writer or for the holder of a lease, and does not take a terminal
-// over.
+// With these flags, open() does not wait for a writer of a pipe or for the holder of a lease. A
+// terminal does not become the controlling terminal.
 constexpr int kOpenFlags = O_RDONLY | O_CLOEXEC | O_NONBLOCK | O_NOCTTY;
 
 FileKind KindOf(int fd, uint64_t size);
@@ -95,7 +95,7 @@ FileKind KindOf(int fd, uint64_t size) {
   return IsText(start) ? FileKind::kText : FileKind::kNoArchive;
 }
 
-// Of as many of them as can be seen.
+// If the directory cannot be read to its end, counts the packages before the error.
 uint64_t CountPackages(const std::string& directory) {
   namespace fs = std::filesystem;
   uint64_t count = 0;
@@ -107,7 +107,7 @@ uint64_t CountPackages(const std::string& directory) {
   return count;
 }
 
-// No control characters but those that texts have.
+// True if the only control characters are those of texts, such as line feeds.
 bool IsText(const std::string& start) {
   return std::all_of(start.begin(), start.end(), [](char c) {
     const unsigned char byte = static_cast<unsigned char>(c);
@@ -137,7 +137,8 @@ void ReadArchive(int fd, const IsLate& is_late, PackageFacts* facts) {
   facts->was_changed = archive.HasShrunk();
 }
 
-// The platform's library opens no archive that has one.
+// Returns the first name that the archive has twice. The platform's library does not open such an
+// archive.
 std::string FindEntryTwice(int fd) {
   const auto end = FindArchiveEnd(fd);
   std::unordered_set<std::string> names;
@@ -147,7 +148,7 @@ std::string FindEntryTwice(int fd) {
   return {};
 }
 
-// The tool's walk names all but the damaged ones.
+// The tool's walk does not name damaged entries. The second loop adds them from `facts->entries`.
 void FindLibraries(const Archive& archive, const std::string& path, PackageFacts* facts) {
   const ArchiveWalk walk = archive.Walk(kLibraryNames);
   for (size_t i = 0; i < walk.names.size(); ++i) {

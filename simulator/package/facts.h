@@ -39,7 +39,7 @@ struct LibraryFacts {
   // The installer's place for it, relative to the package's directory; empty: no phone of this kind
   // installs it.
   std::string place;
-  bool is_met = true;          // true if the tool's walk over the libraries comes to it
+  bool is_met = true;          // true if the tool's walk over the libraries reaches it
   int error = 0;               // errno of opening the file as the tool does; 0: it can be opened
   bool has_directory = false;  // the file's directory exists
 };
@@ -48,7 +48,7 @@ struct PackageFacts {
   FileKind kind = FileKind::kUnreadable;
   int error = 0;              // errno of opening the file
   bool is_read_only = false;  // its file system is read-only
-  bool was_changed = false;   // the file was changed while it was examined
+  bool was_changed = false;   // the file became shorter while it was read
   uint64_t size = 0;          // of the file, in bytes
   std::string sha256;         // of the file's bytes; empty: it was not read to its end
   uint64_t packages = 0;      // for a directory: the number of files in it with package names

@@ -79,7 +79,7 @@ void ReadBlock(const Bytes& block, JarSignatureFacts* jar) {
                                  signer != jar->certificate->key_id;
 }
 
-// None where the key ends beyond the block: the tool does not take it then.
+// None if the key ends beyond the block, because the tool does not accept such a key.
 std::optional<ToolKey> ReadToolKey(const Bytes& block, const pkcs7& record) {
   const auto room = static_cast<size_t>(block.data() + block.size() - record.modulus);
   if (record.modulus > block.data() + block.size() || record.modulus_length > room) return {};
@@ -93,7 +93,7 @@ std::optional<ToolKey> ReadToolKey(const Bytes& block, const pkcs7& record) {
   return key;
 }
 
-// Whether `tbs` is the tbsCertificate of this certificate.
+// True if `tbs` points to the tbsCertificate of `certificate`.
 bool IsCertificateAt(std::string_view certificate, const uint8_t* tbs) {
   asn1_hdr header;
   return asn1_get_next(reinterpret_cast<const uint8_t*>(certificate.data()), certificate.size(),

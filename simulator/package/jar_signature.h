@@ -1,7 +1,7 @@
-// The JAR signature that the tool looks at, and the facts beside it. The tool's own code reads the
-// texts, the key and the names of the files. Parts that only explain are read strictly
-// (signature_block.h) or by libcrypto (certificate.h). Only the tool says whether the signature
-// holds.
+// The JAR signature that the tool verifies, and facts that explain the tool's answer. The tool's
+// own code reads the texts, the key and the names of the files. Parts that only explain the answer
+// are read as strict DER (signature_block.h) or by libcrypto (certificate.h). Only the tool decides
+// whether the signature is valid.
 #pragma once
 
 #include <cstddef>
@@ -31,16 +31,16 @@ struct JarSignatureFacts {
   std::vector<std::string> signature_files;
   std::string claimed_schemes;        // X-Android-APK-Signed, such as "2, 3"; empty: not stated
   bool has_manifest_digest = false;   // the signature file states one, of any kind
-  bool has_sha1_of_manifest = false;  // the one that the tool takes is a SHA-1 digest
-  // The name of the block that the tool looks for, "RSA"; or that of a block for another kind of
-  // key, if there is only such a block.
+  bool has_sha1_of_manifest = false;  // the one that the tool uses is a SHA-1 digest
+  // The name of the block that the tool looks for (.RSA). If the package has only a block for
+  // another kind of key (.EC or .DSA), the name of that block.
   std::string block_name;
   bool has_block = false;
   // None if the tool cannot read a key.
   std::optional<ToolKey> key;
 
   SignatureBlockFacts block;  // as a strict reader finds it; its certificate is not kept
-  // The first certificate. If the tool reads a key, it must be the one that the tool reads.
+  // The first certificate; none if the tool reads its key from another certificate.
   std::optional<CertificateFacts> certificate;
   bool names_other_certificate = false;  // the first signer's identifier names another certificate
 };

@@ -1,4 +1,4 @@
-// Which files of a directory are packages: known by their names. Nothing is kept, nothing is read.
+// Recognises packages by their file names. Reads no files.
 #pragma once
 
 #include <strings.h>
@@ -9,11 +9,11 @@
 
 namespace simulator {
 
-// Packages, JARs, and what packages are delivered in.
+// The endings of packages, JARs, and archives in which packages are delivered.
 inline constexpr std::string_view kPackageEndings[] = {".apk",  ".jar",  ".apks",
                                                        ".xapk", ".apkm", ".aab"};
 
-// True if `name` ends so, in any letter case.
+// True if `name` has one of these endings, in upper or lower case.
 inline bool IsPackageName(std::string_view name) {
   return std::any_of(std::begin(kPackageEndings), std::end(kPackageEndings),
                      [name](std::string_view ending) {

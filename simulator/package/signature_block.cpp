@@ -36,7 +36,7 @@ SignatureBlockFacts ParseSignatureBlock(std::string_view block) {
 
 namespace {
 
-// Up to where the certificates come.
+// Enters the SignedData, and skips the fields before the certificates.
 bool EnterSignedData(CBS block, CBS* signed_data) {
   CBS content_info, content, skipped;
   return CBS_get_asn1(&block, &content_info, CBS_ASN1_SEQUENCE) &&
@@ -57,7 +57,8 @@ bool ReadSigners(CBS signers, SignatureBlockFacts* facts) {
   return facts->signer_count > 0;
 }
 
-// SignerInfo: version, whose certificate, digest, signed attributes or none, algorithm, signature.
+// The fields of a SignerInfo: version, signer identifier, digest algorithm, signed attributes
+// (optional), signature algorithm, signature.
 bool ReadSigner(CBS signer, SignatureBlockFacts* facts) {
   CBS skipped, identifier, digest, algorithm;
   int has_attributes = 0;

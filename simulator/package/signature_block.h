@@ -1,6 +1,7 @@
-// The signature block of a JAR, a PKCS#7 SignedData (RFC 2315 §9), as strict DER. The tool reads it
-// its own way; this reader of its own is there for two things that the tool does not tell: what is
-// in a block that it refused, and what a strict reader sees in one that it took.
+// Reads the signature block of a JAR, a PKCS#7 SignedData (RFC 2315 §9), as strict DER. The tool's
+// own reader is not strict. This reader shows two things that the tool does not report: the
+// contents of a block that the tool refused, and what a strict reader finds in a block that the
+// tool accepted.
 #pragma once
 
 #include <cstddef>
@@ -10,7 +11,7 @@
 namespace simulator {
 
 struct SignatureBlockFacts {
-  bool is_whole = false;         // the block read to its last signer
+  bool is_whole = false;         // the block could be read to its last signer
   std::string_view certificate;  // the first one, in the caller's bytes; DER
   size_t signer_count = 0;
   // Of the first signer:

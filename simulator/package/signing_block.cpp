@@ -28,8 +28,8 @@ bool TakePrefixed(CBS* bytes, CBS* part);
 
 }  // namespace
 
-// A block is its size, the pairs, the size again, and the magic. Each size counts all bytes after
-// the first size field. If the two sizes differ, the platform finds no block.
+// A block consists of its size, the pairs, the size again, and the magic. Each size counts all
+// bytes after the first size field. If the two sizes differ, the platform finds no block.
 std::string ReadSigningBlock(int fd, const ArchiveEnd& end, bool* is_too_large) {
   *is_too_large = false;
   if (end.directory_offset < kSizeField + kFooter) return {};
@@ -99,7 +99,8 @@ bool ReadCertificate(CBS signer, CBS* certificate) {
          TakePrefixed(&signed_data, &certificates) && TakePrefixed(&certificates, certificate);
 }
 
-// Takes a part that has its length in front of it, in bytes: 4 bytes, little-endian.
+// Takes a part that follows its length. The length field has 4 bytes, little-endian, and counts
+// bytes.
 bool TakePrefixed(CBS* bytes, CBS* part) {
   uint32_t size = 0;
   return CBS_get_u32le(bytes, &size) && CBS_get_bytes(bytes, part, size);

@@ -1,7 +1,7 @@
-// The signatures of the schemes after JAR signing (v2, v3, v3.1), as far as whose key made them:
-// the signing block, which lies between an archive's entries and its central directory. Found as
-// the platform finds it. Digests and signatures are not verified. All results are bounded and point
-// into the caller's bytes.
+// The signers of the schemes after JAR signing (v2, v3, v3.1). They are in the signing block, which
+// is between an archive's entries and its central directory. The block is found in the same way as
+// the platform finds it. Digests and signatures are not verified. The number of signers is limited,
+// and their certificates point into the caller's bytes.
 #pragma once
 
 #include <cstdint>
@@ -16,22 +16,22 @@ namespace simulator {
 // One signer of one scheme.
 struct NewerSigner {
   const char* scheme;            // "v2", "v3" or "v3.1"
-  std::string_view certificate;  // DER, the first of the signer's chain, whose key signs
+  std::string_view certificate;  // DER; the first of the signer's chain, with the key that signs
 };
 
 struct SigningBlock {
-  // In the order of the block; of several values for one scheme the first counts.
+  // In the order of the block. If a scheme has several values, the first one counts.
   std::vector<NewerSigner> signers;
-  // Something in the block did not read; the signers are those before it.
+  // A part of the block is malformed. The signers are those before that part.
   bool is_damaged = false;
 };
 
-// A larger block than this is not read; those of real packages have some kilobytes.
+// In bytes. A larger block is not read. The blocks of real packages have a few kilobytes.
 inline constexpr uint64_t kMostBlockBytes = 16 << 20;
 
-// The signing block of the archive that is open as `fd`, from its first size field to its magic.
-// Empty when the archive has no such block, or one that is larger than kMostBlockBytes, which
-// `is_too_large` tells.
+// Reads the signing block of the archive that is open as `fd`, from its first size field to its
+// magic. Returns an empty text if the archive has no such block, or if the block is larger than
+// kMostBlockBytes. Sets `is_too_large` to true only in the second case.
 std::string ReadSigningBlock(int fd, const ArchiveEnd& end, bool* is_too_large);
 
 SigningBlock ParseSigningBlock(std::string_view block);

@@ -1,6 +1,6 @@
 // The files in which the kernel publishes each task's integrity value: /proc/self/integrity/value
-// and /proc/PID/integrity/value, for callers that open them through the C library. They can only be
-// read. Each opening, of any task's file, answers the next of the phone's integrity values.
+// and /proc/PID/integrity/value, for callers that open them through the C library. The files are
+// read-only. Each opening, of any task's file, delivers the next of the phone's integrity values.
 #include <fcntl.h>
 #include <sys/mman.h>
 #include <unistd.h>
@@ -38,13 +38,14 @@ STAND_IN FILE* fopen(const char* path, const char* mode) {
   return pid ? OpenIntegrity(*pid, mode) : next(path, mode);
 }
 
-// Programs that are built for large files call fopen by this name. It is one function on a 64-bit
-// system.
+// Programs that are built for large files call fopen by this name. On a 64-bit system, both names
+// are the same function.
 STAND_IN FILE* fopen64(const char* path, const char* mode) __attribute__((alias("fopen")));
 
 namespace {
 
-// The task whose integrity file `path` names, 0 for "self"; none when it names another file.
+// The task to which the integrity file at `path` belongs, 0 for "self". None if `path` is another
+// file.
 std::optional<int> TaskOf(const char* path) {
   constexpr char kBefore[] = "/proc/";
   constexpr char kAfter[] = "/integrity/value";
@@ -87,7 +88,8 @@ bool TaskExists(int pid) {
   return pid == 0 || access(("/proc/" + std::to_string(pid)).c_str(), F_OK) == 0;
 }
 
-// A file of its own that holds `text`, which can be read and no longer written.
+// Makes a new file that contains `text` and cannot be written any more. Returns its descriptor, or
+// -1.
 int FileHolding(const std::string& text, bool closes_on_exec) {
   const int fd = memfd_create("integrity", MFD_ALLOW_SEALING | (closes_on_exec ? MFD_CLOEXEC : 0U));
   if (fd < 0) return fd;

@@ -1,7 +1,8 @@
 // The journal of a simulated run: one JSON object a line, in the order of the events
-// (docs/journal.md describes it). The stand-ins inside the tool and apktoolkit-sim outside it write
-// it. Each line is one appending write, so the lines are in the order of the writes. It needs no
-// JSON library, because the stand-ins must not bring libraries into the tool's process.
+// (docs/journal.md describes it). Both the stand-ins inside the tool and apktoolkit-sim outside it
+// write to the journal. Each line is one appending write, so the lines are in the order of the
+// writes. This code needs no JSON library, because the stand-ins must not bring libraries into the
+// tool's process.
 #pragma once
 
 #include <cstdint>
@@ -12,7 +13,7 @@
 
 namespace simulator {
 
-// The version of the schema; the journal's first line carries it.
+// The version of the schema; the journal's first line contains it.
 inline constexpr int kJournalVersion = 1;
 
 // One line under construction. Keys are plain ASCII names.
@@ -28,10 +29,10 @@ class Event {
     return Json(key, '"' + HexText(bytes) + '"');
   }
   Event& Null(const char* key) { return Json(key, "null"); }
-  // A value that is JSON already.
+  // A value that is already JSON.
   Event& Json(const char* key, std::string_view value);
 
-  // The whole line, with its end.
+  // The whole line, with its line feed.
   std::string Line() const { return line_ + "}\n"; }
   // Appends the line to the open file `journal`. Returns false if it could not be written whole.
   bool AppendTo(int journal) const;

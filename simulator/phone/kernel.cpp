@@ -1,9 +1,8 @@
-// The kernel's integrity feature: its two commands, under both names that the C library gives
-// fcntl.
+// The kernel's integrity feature: its two commands, under both names of fcntl in the C library.
 //
-// This file, integrity_file.cpp, log.cpp and standard_output.cpp are one library that is loaded
-// before all others and takes the place of those functions through which the tool meets a phone.
-// Calls that do not concern the phone go on to the next function of that name, unchanged.
+// This file, integrity_file.cpp, log.cpp and standard_output.cpp are one library, which is loaded
+// before all others. It replaces the functions by which the tool uses the phone. Calls that do not
+// concern the phone are passed, unchanged, to the next function with that name.
 #include <fcntl.h>
 #include <sys/mman.h>
 #include <sys/stat.h>
@@ -41,8 +40,8 @@ void Trust(int fd);
 bool IsTrusted(int fd);
 int Answer(Event* event, int error, int errno_before);
 
-// The journal shows that the stand-ins are in place; the environment no longer does, and what the
-// tool starts goes without them.
+// Records in the journal that the stand-ins are in place. Removes LD_PRELOAD from the environment,
+// so that programs that the tool starts do not load the stand-ins.
 __attribute__((constructor)) void Attach() {
   const ErrnoKeeper keeper;
   Record(Event("attached").Number("pid", getpid()));
@@ -52,7 +51,7 @@ __attribute__((constructor)) void Attach() {
 
 }  // namespace
 
-// Every command takes at most one argument, of a pointer's size at most.
+// Every command has at most one argument, which is not larger than a pointer.
 STAND_IN int fcntl(int fd, int command, ...) {
   static FcntlFunction* const next = NextFunction<FcntlFunction>("fcntl");
   va_list arguments;
@@ -64,7 +63,7 @@ STAND_IN int fcntl(int fd, int command, ...) {
   return next(fd, command, argument);
 }
 
-// One function in the C library of a 64-bit system, too.
+// In the C library of a 64-bit system, both names are the same function.
 STAND_IN int fcntl64(int fd, int command, ...) __attribute__((alias("fcntl")));
 
 namespace {
@@ -96,8 +95,8 @@ int DescriptorError(int fd) {
   return flags < 0 || (flags & O_PATH) != 0 ? EBADF : 0;
 }
 
-// Copies the payload that starts at `argument`: a 16-bit length in host byte order, then as many
-// bytes. Memory that cannot be read is EFAULT, and `payload` then stays empty.
+// Copies the payload that starts at `argument`: a 16-bit length in host byte order, then that many
+// bytes. Returns 0, or EFAULT if the memory cannot be read; in that case `payload` is unchanged.
 int CopyPayload(const void* argument, std::string* payload) {
   const char* const from = static_cast<const char*>(argument);
   uint16_t length = 0;
@@ -110,8 +109,9 @@ int CopyPayload(const void* argument, std::string* payload) {
   return 0;
 }
 
-// As the kernel copies from a process: false, and no signal, where there is nothing to read. The
-// way through a file makes the real kernel do it, and works under an emulator, too.
+// Copies from the process's memory as the kernel does: if the memory cannot be read, returns false,
+// and no signal is sent. The real kernel makes the copy, by way of a file. This works under an
+// emulator, too.
 bool CopyIn(const char* from, size_t size, char* to) {
   const ssize_t wanted = static_cast<ssize_t>(size);
   return pwrite(Scratch(), from, size, 0) == wanted && pread(Scratch(), to, size, 0) == wanted;
@@ -122,7 +122,7 @@ int Scratch() {
   return scratch;
 }
 
-// The files that this process had signed.
+// The files that were signed for this process.
 struct SignedFiles {
   std::mutex mutex;
   std::vector<FileId> ids;
@@ -152,7 +152,7 @@ bool IsTrusted(int fd) {
   return holds(ThisPhone().trusted) || holds(Signed().ids);
 }
 
-// Records what the kernel answers, and answers it.
+// Records the kernel's answer in the journal, and returns it.
 int Answer(Event* event, int error, int errno_before) {
   const int result = error == 0 ? 0 : -1;
   Record(event->Number("result", result).Number("errno", error));

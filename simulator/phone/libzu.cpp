@@ -1,5 +1,5 @@
-// The stand-in for the closed process-authentication library. The tool is linked against it as it
-// is against the real one.
+// The stand-in for the closed process-authentication library. The tool is linked against it in the
+// same way as against the real library.
 #include "sign/libzu.h"
 
 #include <string_view>
@@ -11,7 +11,7 @@ namespace simulator {
 
 namespace {
 
-// The tool gets this on a workstation, which has no service to register with.
+// The answer if no phone is simulated. A workstation has no service to register with.
 constexpr int kNoService = -1;
 
 }  // namespace

@@ -1,4 +1,4 @@
-// The Android log of the phone: the records of the tool and of the platform libraries under it.
+// The Android log of the phone: the records of the tool and of the platform libraries that it uses.
 #include "simulator/phone/log_library.h"
 
 #include <cstdarg>
@@ -49,7 +49,7 @@ STAND_IN int __android_log_vprint(int priority, const char* tag, const char* for
   return LogFormatted(priority, tag, format, arguments);
 }
 
-// All of the log's buffers are one here.
+// The simulated log has only one buffer.
 STAND_IN int __android_log_buf_write(int, int priority, const char* tag, const char* text) {
   return Log(priority, tag, text);
 }
@@ -62,8 +62,8 @@ STAND_IN int __android_log_buf_print(int, int priority, const char* tag, const c
   return result;
 }
 
-// The platform's C++ libraries, the zip library among them, write their warnings through one of
-// these two: each generation of the log library has its own.
+// The platform's C++ libraries, such as the zip library, write their warnings by one of these two
+// functions. Each generation of the log library has its own.
 STAND_IN void __android_log_write_logger_data(__android_logger_data* data, const char* text) {
   ReadLogRecord(data, text, Log);
 }

@@ -1,12 +1,13 @@
-// How a stand-in that is loaded before all other libraries hands on what does not concern it.
+// Finds the function that a stand-in replaces. The stand-in is loaded before all other libraries,
+// and passes on the calls that do not concern the phone.
 #pragma once
 
 #include <dlfcn.h>
 
 namespace simulator {
 
-// The next function `name` behind this library in the order of loading: the one that the process
-// would call without the stand-in.
+// The next function `name` after this library in the order of loading. The process would call this
+// function without the stand-in.
 template <typename Function>
 Function* NextFunction(const char* name) {
   return reinterpret_cast<Function*>(dlsym(RTLD_NEXT, name));

@@ -9,9 +9,9 @@ namespace simulator {
 namespace {
 
 constexpr char kJournal[] = "APKTOOLKIT_SIM_JOURNAL";       // a path
-constexpr char kIntegrity[] = "APKTOOLKIT_SIM_INTEGRITY";   // texts between commas
-constexpr char kTrust[] = "APKTOOLKIT_SIM_TRUST";           // DEVICE:INODE between commas
-constexpr char kSignErrno[] = "APKTOOLKIT_SIM_SIGN_ERRNO";  // a decimal number, as the next
+constexpr char kIntegrity[] = "APKTOOLKIT_SIM_INTEGRITY";   // texts, separated by commas
+constexpr char kTrust[] = "APKTOOLKIT_SIM_TRUST";           // DEVICE:INODE, separated by commas
+constexpr char kSignErrno[] = "APKTOOLKIT_SIM_SIGN_ERRNO";  // decimal, like the next two
 constexpr char kVerifyErrno[] = "APKTOOLKIT_SIM_VERIFY_ERRNO";
 constexpr char kZuResult[] = "APKTOOLKIT_SIM_ZU_RESULT";
 
@@ -59,7 +59,7 @@ int Number(const char* name, int otherwise) {
   return text == nullptr ? otherwise : static_cast<int>(strtol(text, nullptr, 10));
 }
 
-// A word that is not DEVICE:INODE gives inode 0, which no file has.
+// If the text is not DEVICE:INODE, the result has inode 0, which no file has.
 FileId ParseFileId(const std::string& text) {
   const size_t colon = text.find(':');
   if (colon == std::string::npos) return {0, 0};

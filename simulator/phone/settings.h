@@ -1,7 +1,7 @@
 // The settings of the simulated phone. They travel from apktoolkit-sim to the stand-ins in
 // environment variables, one per setting, all with the prefix APKTOOLKIT_SIM_. A setting without a
-// variable is as on a healthy phone. Both sides use this file, so that names and formats stand in
-// one place.
+// variable has the value of a healthy phone. Both apktoolkit-sim and the stand-ins use this file,
+// so that names and formats are defined in one place.
 #pragma once
 
 #include <sys/types.h>
@@ -12,7 +12,7 @@
 
 namespace simulator {
 
-// A file as the kernel tells files apart, independent of its name.
+// The identity of a file for the kernel, independent of its name.
 struct FileId {
   dev_t device;
   ino_t inode;
@@ -22,7 +22,7 @@ inline bool operator==(const FileId& a, const FileId& b) {
   return a.device == b.device && a.inode == b.inode;
 }
 
-// In `PhoneSettings::integrity`: at this opening the file does not exist.
+// A value in `PhoneSettings::integrity`: the file does not exist at this opening.
 inline constexpr char kMissing[] = "missing";
 
 struct PhoneSettings {
@@ -33,18 +33,19 @@ struct PhoneSettings {
   std::vector<std::string> integrity = {"1f"};
   // The files that the kernel trusts from the start.
   std::vector<FileId> trusted;
-  // The kernel's answer to a signing that is in order; 0: it signs.
+  // The kernel's errno for a valid request to sign; 0: the kernel signs.
   int sign_errno = 0;
-  // The kernel's answer when it verifies a file that it does not trust.
+  // The kernel's errno for a request to verify a file that it does not trust.
   int verify_errno = ENOKEY;
   // The answer of libzu to a registration.
   int zu_result = 0;
 };
 
-// The settings of this process's environment.
+// Reads the settings from this process's environment.
 PhoneSettings SettingsFromEnvironment();
 
-// The same as NAME=VALUE words, complete: no setting is left to what a variable was before.
+// Returns the settings as NAME=VALUE words. Every setting has a word, so that a variable of the
+// present environment has no effect.
 std::vector<std::string> SettingsToEnvironment(const PhoneSettings& phone);
 
 }  // namespace simulator

@@ -4,7 +4,8 @@ namespace simulator {
 
 namespace {
 
-// Open from the start, so that a process without a free descriptor is recorded all the same.
+// Opened at the start, so that events are recorded even if the process has no free descriptor
+// later.
 int JournalDescriptor() {
   static const int journal =
       ThisPhone().journal.empty() ? -1 : OpenJournal(ThisPhone().journal.c_str());

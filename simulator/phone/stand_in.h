@@ -1,6 +1,6 @@
-// Shared by the stand-ins inside the tool's process: the phone's settings, the journal, and means
-// to leave no traces in the tool, such as a changed errno. Each of the two libraries has its own
-// copy. Nothing here is destroyed at exit, because the tool's last output is recorded after the
+// Shared by the stand-ins inside the tool's process: the phone's settings, the journal, and a means
+// to keep errno unchanged for the tool. Each of the two stand-in libraries has its own copy.
+// Nothing here is destroyed at exit, because the tool's last output is recorded after the
 // destructors have run.
 #pragma once
 

@@ -61,7 +61,7 @@ std::string HexText(std::string_view bytes) {
   return text;
 }
 
-// Well-formed as RFC 3629 §4 has it: no overlong forms, no surrogates, nothing above U+10FFFF.
+// A character is valid as in RFC 3629 §4: no overlong forms, no surrogates, nothing above U+10FFFF.
 size_t Utf8Length(std::string_view bytes) {
   constexpr uint32_t kLeast[] = {0, 0, 0x80, 0x800, 0x10000};
   if (bytes.empty()) return 0;
@@ -101,7 +101,7 @@ std::vector<std::string> Split(const std::string& text, char separator) {
 
 namespace {
 
-// One of the characters U+F780 to U+F7FF, which stand for bytes.
+// True for the characters U+F780 to U+F7FF, which represent bytes.
 bool IsPrivateByte(std::string_view character) {
   return character.size() == 3 && character[0] == '\xef' &&
          (character[1] == '\x9e' || character[1] == '\x9f');
@@ -116,7 +116,7 @@ uint32_t CodeOf(std::string_view character) {
   return code;
 }
 
-// Beyond U+FFFF as two surrogates (RFC 8259 §7).
+// Writes a character above U+FFFF as two surrogates (RFC 8259 §7).
 void AppendEscape(uint32_t code, std::string* out) {
   if (code > 0xffff) {
     AppendEscape(0xd7c0U + (code >> 10), out);

@@ -18,7 +18,7 @@ Events ParseEvents(const std::string& journal);
 std::string TextOf(const nlohmann::json& event, const char* key);
 int64_t NumberOf(const nlohmann::json& event, const char* key);
 
-// True if the answer in `event`, of the kernel or libzu, is 0.
+// True if the answer of the kernel or libzu in `event` is 0.
 bool IsSuccess(const nlohmann::json& event);
 
 // True if `event` describes the run. The others describe the journal itself.

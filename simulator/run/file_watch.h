@@ -1,4 +1,4 @@
-// Notices that a file is changed while it is looked at. The tool, the simulator and the installer's
+// Detects that a file is changed while it is examined. The tool, the simulator and the installer's
 // verifier read a file one after the other; if it changes, their answers are about different bytes.
 #pragma once
 
@@ -16,8 +16,9 @@ class FileWatch {
   explicit FileWatch(const std::string& path);
 
   // Call it when nothing reads the file any more. If the file was changed since, the run gets a
-  // failure in place of its result. A change of the inode alone, by a hard link or chmod, is none
-  // if the bytes still have the digest that the run found. Does nothing if `path` was no file.
+  // failure in place of its result. A change of the inode alone, such as by a hard link or chmod,
+  // does not count if the bytes still have the digest that the run found. Does nothing if `path`
+  // was not a regular file.
   void Check(FileRun* run) const;
 
  private:

@@ -118,7 +118,7 @@ std::string Installation::WithStablePaths(const std::string& journal) const {
 
 namespace {
 
-// Damaged entries count as well.
+// Includes the names of damaged entries.
 std::vector<std::string> LibraryNames(const Archive& archive) {
   std::vector<std::string> names;
   for (const ArchiveEntry& entry : archive.Entries()) {
@@ -128,8 +128,8 @@ std::vector<std::string> LibraryNames(const Archive& archive) {
 }
 
 // True if neither a directory of the installer nor a path at which the tool looks for a library
-// exists. Like the tool, it looks beside the open file, not beside a link to it. Returns false for
-// a file on a read-only file system, because the tool leaves it alone.
+// exists. Like the tool, this function looks beside the open file, not beside a link to it. Returns
+// false for a file on a read-only file system, because the tool does not sign there.
 bool LiesAlone(int package, const std::vector<std::string>& libraries) {
   const std::string file = GetFilenameByFd(package);
   struct statvfs system = {};
@@ -149,8 +149,8 @@ bool LiesAlone(int package, const std::vector<std::string>& libraries) {
   });
 }
 
-// An installer uses one ABI for each kind of processor: of two ABIs for the same kind, the first
-// that the package has. The libraries of other processors are not for this phone and are left out.
+// An installer uses one ABI for each kind of processor. Of two ABIs for the same kind, it uses the
+// first one for which the package has libraries. The libraries of all other ABIs are not laid out.
 Layout PlanLayout(const std::vector<std::string>& entries, InstalledAbi choice,
                   std::vector<std::string>* left_out, std::set<std::string>* of_other_processors) {
   Layout layout;
@@ -190,8 +190,8 @@ bool Wants(InstalledAbi choice, bool is_arm64, bool has_arm64) {
   return choice == InstalledAbi::kAll || (choice == InstalledAbi::kArm64) == is_arm64;
 }
 
-// Makes a hard link to the package if the file system allows it, else a copy. Returns false with
-// errno set.
+// Makes a hard link to the package if the file system allows it, else a copy. Returns false, with
+// errno set, if neither can be made.
 bool PutPackage(const std::string& file, int source, const std::string& copy,
                 const Deadline& deadline) {
   constexpr size_t kPart = 1 << 20;

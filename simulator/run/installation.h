@@ -1,5 +1,5 @@
-// A package laid out as an installer does it: in a temporary directory, with its native libraries
-// beside it. The destructor removes the directory.
+// A package laid out in the same way as by an installer: in a temporary directory, with its native
+// libraries beside it. The destructor removes the directory.
 #pragma once
 
 #include <optional>
@@ -48,13 +48,13 @@ class Installation {
   const std::string& path() const { return path_; }
   // True if the package was laid out.
   bool is_done() const { return is_done_; }
-  // The journal with kInstalledDirectory instead of the name of this directory, so that it is the
-  // same in each run.
+  // The journal with kInstalledDirectory instead of the name of this directory, so that the journal
+  // is the same in each run.
   std::string WithStablePaths(const std::string& journal) const;
   // The library entries of processors that were not asked for.
   const std::set<std::string>& of_other_processors() const { return of_other_processors_; }
-  // The library entries whose names an installer does not take, and those that it would take but
-  // cannot extract.
+  // The library entries whose names no installer accepts, and those with accepted names that cannot
+  // be extracted.
   const std::vector<std::string>& left_out() const { return left_out_; }
   const std::vector<std::string>& not_extracted() const { return not_extracted_; }
 

@@ -11,7 +11,7 @@ namespace simulator {
 // The meaning of a record of the tool's log. The comment above a group names the captured parts, if
 // there are any.
 enum class LogMeaning {
-  // None of the texts; a detail of an error that another record also names.
+  // kUnknown: none of the texts. kDetail: a detail of an error that another record also reports.
   kUnknown,
   kDetail,
   // The steps of a run. "Taken up": the tool starts to sign the package, or one of its libraries.
@@ -21,8 +21,8 @@ enum class LogMeaning {
   kPackageTakenUp,
   kJarTakenUp,
   kNotSigned,
-  // Reasons why a file is not a package, or not a good one. Captured are the zip library's code or
-  // reason, the block's name, and the codes of crypto/rsa.h.
+  // Reasons why a file is not a package, or not a good one. The captured parts are the zip
+  // library's code or reason, the block's name, and the codes of crypto/rsa.h.
   kNoArchive,
   kNoAndroidManifest,
   kNoBlock,
@@ -37,8 +37,8 @@ enum class LogMeaning {
   kAndroidManifestMalformed,
   kNoGoodPackage,
   kNoArchiveToSign,
-  // Reasons why a library or the dex file is not good. Captured are the library's path, and errno
-  // from the next record.
+  // Reasons why a library or the dex file is not good. The captured parts are the library's path
+  // and, in kErrorNumber, errno.
   kFileNotOpened,
   kFileNotRead,
   kNotListed,

@@ -18,14 +18,14 @@ void Catch(int signal) { caught = signal; }
 
 }  // namespace
 
-// /dev/null replaces a closed stream. It is read-only, because output that nobody gets must fail.
-// exec closes it, so that started programs find the stream closed, as it was.
+// /dev/null replaces a closed stream. It is opened read-only, because a write to the closed stream
+// must fail. exec closes it, so that started programs find the stream closed, as it was.
 bool KeepStandardStreams() {
   const bool has_input = fcntl(STDIN_FILENO, F_GETFD) >= 0;
   for (const int stream : {STDIN_FILENO, STDOUT_FILENO, STDERR_FILENO}) {
     if (fcntl(stream, F_GETFD) < 0) open("/dev/null", O_RDONLY | O_CLOEXEC);
   }
-  // std::cout keeps the standard output of this moment; other output goes to /dev/null.
+  // std::cout keeps the present standard output. Output by way of `stdout` goes to /dev/null.
   std::ios::sync_with_stdio(false);
   if (FILE* const nowhere = fopen("/dev/null", "we")) stdout = nowhere;
   return has_input;
@@ -43,7 +43,7 @@ void CatchInterruptions() {
 
 OwnProcessGroup::OwnProcessGroup() {
   posix_spawnattr_init(&attributes_);
-  posix_spawnattr_setflags(&attributes_, POSIX_SPAWN_SETPGROUP);  // of its own number
+  posix_spawnattr_setflags(&attributes_, POSIX_SPAWN_SETPGROUP);  // a new group
 }
 
 bool IsInterrupted() { return caught != 0; }

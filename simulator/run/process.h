@@ -8,21 +8,21 @@
 namespace simulator {
 
 // Reserves the descriptors of closed standard streams, so that no file of this program gets one.
-// Returns true if there was a standard input. Programs that this process starts find it as it was.
-// Afterwards only std::cout writes to standard output: other output of the tool's own code in this
-// process is discarded. Call it before anything is printed.
+// Returns true if there was a standard input. Programs that this process starts find the streams as
+// they were. Afterwards only std::cout writes to standard output: other output of the tool's own
+// code in this process is discarded. Call it before anything is printed.
 bool KeepStandardStreams();
 
-// After this call, an interruption from the keyboard, a request to end, or an output that nobody
-// reads any more does not end the process before it has cleaned up.
+// After this call, SIGINT, SIGTERM, SIGHUP, SIGQUIT and SIGPIPE do not end the process before it
+// has cleaned up. Signals that were ignored before are still ignored.
 void CatchInterruptions();
 bool IsInterrupted();
 // If a signal was caught, ends the process by that signal.
 void EndIfInterrupted();
 
 // For posix_spawn: the new process gets a process group of its own. A signal from the keyboard goes
-// to a whole group, and must reach this process alone: it then ends the others, and does not take
-// their end for their own.
+// to a whole group, but must reach only this process, which then ends the others. If the signal
+// reached them, their end would look like a failure.
 class OwnProcessGroup {
  public:
   OwnProcessGroup();

@@ -16,9 +16,9 @@ void RunInOrder(size_t count, unsigned jobs, const std::function<void(size_t num
                 const std::function<void(size_t number, int seconds)>& waiting) {
   using Clock = std::chrono::steady_clock;
   constexpr auto kNowAndThen = std::chrono::milliseconds(200);
-  std::mutex mutex;  // of the three below
+  std::mutex mutex;  // protects the three variables below
   std::condition_variable finished;
-  size_t next = 0;  // the number that nobody has taken yet
+  size_t next = 0;  // the first number that no thread has taken yet
   std::vector<bool> has_run(count);
   const auto work = [&] {
     std::unique_lock<std::mutex> lock(mutex);

@@ -12,7 +12,7 @@ namespace {
 
 using nlohmann::json;
 
-// Reads the events one after the other, and keeps in which step the tool is.
+// Reads the events one after the other, and keeps the present step of the tool.
 class Reader {
  public:
   void Read(const json& event);
@@ -34,7 +34,7 @@ class Reader {
   RunRecord record_;
   Step step_ = Step::kOpening;
   std::optional<Attempt> attempt_;  // begun, and not yet closed
-  std::vector<LogLine> pending_;    // errors that the next line tells the use of
+  std::vector<LogLine> pending_;    // errors of a file that a later line names
 };
 
 }  // namespace
@@ -102,7 +102,7 @@ void Reader::ReadInformation(const LogLine& line) {
   if (meaning == LogMeaning::kJarTakenUp || meaning == LogMeaning::kPackageTakenUp) Begin();
 }
 
-// Of an error behind the first step.
+// Reads an error that was logged after the opening of the file.
 void Reader::ReadError(const LogLine& line) {
   switch (line.meaning) {
     case LogMeaning::kNotSigned:
@@ -133,7 +133,7 @@ void Reader::ReadError(const LogLine& line) {
       record_.has_no_key_path = true;
       return;
     case LogMeaning::kRegistrationFailed:
-      // The answer itself is an event.
+      // The journal already has the answer as an event.
       if (record_.registrations.empty() ||
           IsZuSuccess(static_cast<int>(record_.registrations.back().result))) {
         record_.other_errors.push_back(line.whole);
@@ -163,8 +163,9 @@ void Reader::ReadVerify(const json& event) {
   record_.verify_error = IsSuccess(event) ? 0 : std::max<int64_t>(NumberOf(event, "errno"), 1);
 }
 
-// The step tells whether it is the file itself that the kernel is asked about; before and after the
-// steps, where the tool asks for nothing, its path.
+// True if the kernel is asked about the file itself. While the tool signs libraries or the file,
+// the step decides. At other times the tool asks the kernel nothing. If another program asks, the
+// path decides.
 bool Reader::IsOwn(const std::string& path) const {
   if (step_ == Step::kLibraries || step_ == Step::kFile) return step_ == Step::kFile;
   return path.empty() || path == record_.PathForTool();
@@ -184,7 +185,7 @@ void Reader::AddLibrary(const std::string& path, Attempt::Outcome outcome) {
   record_.libraries.push_back(attempt);
 }
 
-// A package that is not good, and a JAR that is not trusted, leave an attempt that came to nothing.
+// Drops an attempt without a result. The package was refused, or the JAR is not trusted.
 void Reader::CloseAttempt() {
   const std::optional<Attempt> attempt = std::exchange(attempt_, std::nullopt);
   if (!attempt || attempt->outcome == Attempt::Outcome::kBegun) return;

@@ -66,7 +66,7 @@ struct RunRecord {
   bool is_dex_refused = false;
   LogMeaning dex_why = LogMeaning::kUnknown;  // of the first error logged before, if any
   std::vector<Attempt> libraries;             // in order
-  std::optional<Attempt> own;           // the file itself; none: the tool did not come to sign it
+  std::optional<Attempt> own;           // the file itself; none: the tool did not get so far
   std::optional<int64_t> verify_error;  // a plain JAR: 0, or why the kernel does not trust it
   bool is_jar = false;
 
@@ -85,10 +85,10 @@ struct RunRecord {
   // Facts about the run that the journal does not have.
   Failure failure;
   ToolIdentity tool;
-  bool has_standard_input = true;  // the tool was started with one
+  bool has_standard_input = true;  // the tool was started with a standard input
   bool has_no_packages = false;    // a directory without packages; the tool was not run
-  // Library entries of a package that is laid out: those of processors that were not asked for;
-  // those that no installer takes because of their names; those that cannot be extracted.
+  // Library entries of a package that was laid out. First those of processors that were not asked
+  // for, then those whose names no installer accepts, then those that cannot be extracted.
   std::set<std::string> of_other_processors;
   std::vector<std::string> not_laid_out;
   std::vector<std::string> not_extracted;

@@ -22,7 +22,7 @@ bool IsRegular(const std::string& path, struct stat* state) {
   return stat(path.c_str(), state) == 0 && S_ISREG(state->st_mode);
 }
 
-// Empty when the file cannot be read in time.
+// Returns an empty text if the file cannot be read before the deadline.
 std::string DigestOf(const std::string& path, const Deadline& deadline) {
   struct stat state = {};
   if (!IsRegular(path, &state)) return {};

@@ -26,7 +26,7 @@ namespace fs = std::filesystem;
 // Why the last system call failed, as the end of a message.
 std::string ErrnoText() { return std::string(": ") + strerrordesc_np(errno); }
 
-// As the kernel names the file once it is open.
+// The path by which the kernel knows the file once it is open.
 std::string Resolved(const std::string& file) {
   std::error_code error;
   const fs::path path = fs::canonical(file, error);
@@ -38,12 +38,12 @@ void AddId(const std::string& path, std::vector<FileId>* ids) {
   if (stat(path.c_str(), &state) == 0) ids->push_back({state.st_dev, state.st_ino});
 }
 
-// A path by which the tool's process reaches what this process has open.
+// A path by which the tool's process can open the open file `fd` of this process.
 std::string OwnDescriptorPath(int fd) {
   return "/proc/" + std::to_string(getpid()) + "/fd/" + std::to_string(fd);
 }
 
-// A directory for which the tool is not run: all that can be told is why.
+// The result for a directory for which the tool is not run. It contains only the reason.
 FileRun RunOfDirectory(const ListedFile& directory) {
   FileRun run;
   const std::string path = Resolved(directory.name);
@@ -63,11 +63,11 @@ std::string ContentOf(int fd) {
 
 }  // namespace
 
-// Each run has a journal of its own, so that several may run at a time.
+// Each run has its own journal, so that several runs are possible at the same time.
 struct Simulator::Task {
   const Deadline deadline;
   const ScopedFd journal;
-  std::string path;  // of the file that the tool is given, resolved
+  std::string path;  // of the file for the tool, resolved
   Failure failure;
 };
 
@@ -120,7 +120,7 @@ FileRun Simulator::Run(const ListedFile& listed) {
   return run;
 }
 
-// Runs the tool, and has the journal tell how it ended.
+// Runs the tool, and records in the journal how it ended.
 void Simulator::RunToolFor(const std::string& file, Task* task) {
   const PhoneSettings phone = PhoneFor(*task);
   if (task->deadline.HasPassed()) return Fail(Failure::Kind::kTimedOut, "", task);
@@ -150,7 +150,7 @@ void Simulator::RunToolFor(const std::string& file, Task* task) {
   }
 }
 
-// The phone as the run finds it.
+// The settings of the phone at the start of the run.
 PhoneSettings Simulator::PhoneFor(const Task& task) {
   PhoneSettings phone = options_.phone;
   phone.journal = OwnDescriptorPath(task.journal.get());
@@ -159,7 +159,7 @@ PhoneSettings Simulator::PhoneFor(const Task& task) {
   return phone;
 }
 
-// The loader takes spaces and colons for separators; a descriptor's path has none.
+// The loader treats spaces and colons as separators. The path of a descriptor has neither.
 std::string Simulator::PreloadName() const {
   if (kernel_.find_first_of(" :") == std::string::npos) return kernel_;
   return OwnDescriptorPath(kernel_descriptor_->get());
@@ -173,7 +173,8 @@ void Simulator::RememberSigned(const Events& events, Task* task) {
   }
 }
 
-// Once the deadline has passed, everything fails for that.
+// After the deadline or an interruption, every failure is reported as a timeout or as the
+// interruption.
 void Simulator::Fail(Failure::Kind kind, const std::string& detail, Task* task) const {
   task->failure = {kind, detail};
   if (!task->deadline.HasPassed()) return;

@@ -25,7 +25,7 @@ struct RunOptions {
   InstalledAbi abi = InstalledAbi::kPreferred;  // whose libraries are laid out
   unsigned jobs = 1;                            // how many files at a time
   std::string tool;                             // the program that is run
-  bool is_own_tool = false;                     // it is the one beside this program
+  bool is_own_tool = false;                     // it is the tool beside this program
   std::vector<std::string> runner;              // words before the tool, such as an emulator's
   double timeout = 30;                          // seconds, for each file
 };
@@ -45,8 +45,8 @@ class Simulator {
   // simulation can begin, else the reason why it cannot.
   std::optional<std::string> Prepare();
 
-  // Runs the tool for `file`. Does not run it for a walked directory without packages, or that
-  // cannot be read. Several threads may call it if the options have several jobs.
+  // Runs the tool for `file`. Does not run the tool for a walked directory that has no packages or
+  // cannot be read. Several threads may call this function if `jobs` is more than 1.
   FileRun Run(const ListedFile& file);
 
  private:

@@ -47,8 +47,8 @@ std::string ProgramDirectory() {
 
 namespace {
 
-// The stand-in is loaded into the tool alone: a runner hands the variable on, and has not got it
-// itself.
+// The stand-in is loaded only into the tool. A runner does not have the variable in its own
+// environment, but passes it to the tool.
 Words CommandWords(const ToolCommand& command, Words* environment) {
   const std::string preload = "LD_PRELOAD=" + command.kernel;
   Words words = command.runner;
@@ -73,8 +73,8 @@ Words EnvironmentWith(const Words& assignments) {
   return environment;
 }
 
-// Returns 0, or the errno that tells why no child was started. The child gets the standard streams
-// alone, so that the tool's first file is descriptor 3, as on a phone.
+// Returns 0, or the errno of the failure to start the child. The child gets only the standard
+// streams, so that the tool's first file is descriptor 3, as on a phone.
 int Spawn(Words words, Words environment, pid_t* child) {
   posix_spawn_file_actions_t actions;
   posix_spawn_file_actions_init(&actions);
@@ -88,7 +88,7 @@ int Spawn(Words words, Words environment, pid_t* child) {
   return error;
 }
 
-// For the C interface; ends with a null pointer.
+// The words for the C interface, with a null pointer at the end.
 std::vector<char*> Pointers(Words* words) {
   std::vector<char*> pointers;
   for (std::string& word : *words) pointers.push_back(word.data());

@@ -13,7 +13,7 @@ struct ToolCommand {
   std::string tool;
   std::string file;                      // the tool's one argument
   std::string kernel;                    // the library that is loaded before all others
-  std::vector<std::string> environment;  // NAME=VALUE, over what this process has
+  std::vector<std::string> environment;  // NAME=VALUE; adds to or replaces this process's variables
 };
 
 struct ToolEnd {

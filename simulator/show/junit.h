@@ -1,6 +1,6 @@
-// The report of a run for what reads test results: one JUnit document, a test case for each file. A
-// refusal is a failure, and a file that was not judged is an error: no case is ever skipped. All
-// texts from a file are plain text in it.
+// The report of a run for programs that read test results: one JUnit document with a test case for
+// each file. A refusal is a failure, and a file that was not judged is an error. No case is ever
+// skipped. All texts from a file are escaped.
 #pragma once
 
 #include <string>
@@ -17,7 +17,7 @@ inline constexpr std::string_view kJunitStart =
 
 class Junit {
  public:
-  // The next file, in the order of the command line.
+  // Adds the next file, in the order of the command line.
   void Add(const Report& report);
 
   // The whole document, in UTF-8.
@@ -29,8 +29,8 @@ class Junit {
   struct Case {
     std::string name;
     Outcome outcome;
-    std::string type;     // the code of why it did not pass
-    std::string message;  // the same in words
+    std::string type;     // the code of the reason why it did not pass
+    std::string message;  // the same reason in words
     std::string text;     // what was refused, or what is doubtful, and what to do
   };
 

@@ -26,10 +26,10 @@ bool AreSame(const struct stat& one, const struct stat& other) {
   return one.st_dev == other.st_dev && one.st_ino == other.st_ino;
 }
 
-// The file that a path leads to. Its last part need not exist, and may be a link to a file that
-// opening it would make.
+// The path of the file that a write to `path` would open or create. The last part of `path` need
+// not exist. It may be a link to a file that does not exist.
 fs::path Resolved(const std::string& path) {
-  constexpr int kMostLinks = 40;  // as for the kernel
+  constexpr int kMostLinks = 40;  // the kernel's limit
   std::error_code error;
   fs::path target = fs::absolute(path, error);
   for (int i = 0; i < kMostLinks && fs::is_symlink(target, error); ++i) {

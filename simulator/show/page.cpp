@@ -101,8 +101,8 @@ data FileFields(const Report& report, size_t number, const PageRun& run) {
   return file;
 }
 
-// Each long part is cut before the parts are put together. The key stands behind a name of any
-// length.
+// Each long part is cut before the parts are joined. Otherwise a long name could cut off the key
+// that follows it.
 list HeadLines(const Report& report) {
   Report head;
   head.package_name = Short(report.package_name);
@@ -164,7 +164,7 @@ void AddPicture(const Report& report, data* file) {
   AddLines("unlisted", report.protection.unlisted_names, "", name, file);
 }
 
-// Schemes of the same certificate are told together.
+// Schemes with the same certificate are shown together.
 void AddSigners(const Report& report, data* file) {
   struct Signer {
     std::vector<std::string> schemes;
@@ -195,7 +195,8 @@ void AddSigners(const Report& report, data* file) {
   AddLines("signers", signers, "", make, file);
 }
 
-// A text that is the simulator's own, with the names of options apart, which no line end may part.
+// Separates the names of options from the rest of a text of the simulator, because the page must
+// not break a line inside an option.
 list Pieces(std::string_view text) {
   static const std::regex kOption("--[a-z][a-z-]*(=[A-Za-z]+)?");
   list pieces;
@@ -211,7 +212,7 @@ list Pieces(std::string_view text) {
   return pieces;
 }
 
-// The facts of the file and of the run. A reader who gets this part alone needs them.
+// The facts of the file and of the run, for a reader who gets only this part of the page.
 list FactRows(const Report& report, const PageRun& run) {
   Rows rows = {{"path", report.path}};
   if (!report.file_sha256.empty()) {
@@ -229,7 +230,7 @@ list FactRows(const Report& report, const PageRun& run) {
   return shown;
 }
 
-// The tool tells nobody its version. It is the simulator's where both are of one build.
+// The tool does not report its version. The tool of the same build has the simulator's version.
 std::string ToolText(const PageRun& run) {
   if (run.tool.empty()) return "apktoolkit " APKTOOLKIT_VERSION;
   return Short(run.tool) + " (--tool; its version is not known)";

@@ -1,7 +1,7 @@
-// The page for a browser: one self-contained HTML document for all files of a run, without scripts
-// and without anything from elsewhere. It says what the terminal says, in the same words, and shows
-// which bytes of a package its signature protects. All texts from a file are escaped, and their
-// length and number are bounded for a file of any size.
+// The page for a browser: one self-contained HTML document for all files of a run. It has no
+// scripts and loads nothing. It has the same words as the output on a terminal, and also shows
+// which bytes of a package its signature protects. All texts from a file are escaped. Their length
+// and number are limited, even for a very large file.
 #pragma once
 
 #include <ctime>
@@ -35,17 +35,17 @@ class Page {
  public:
   explicit Page(PageRun run) : run_(std::move(run)) {}
 
-  // The next file, in the order of the command line.
+  // Adds the next file, in the order of the command line.
   void Add(const Report& report);
 
-  // The whole document, in UTF-8. `unseen` is set if the run was interrupted, and counts the files
-  // that it did not come to.
+  // The whole document, in UTF-8. `unseen` is set if the run was interrupted, and is the number of
+  // files that the run did not reach.
   std::string Html(std::optional<size_t> unseen = {}) const;
 
  private:
   PageRun run_;
   PageTable table_;
-  kainjow::mustache::list files_;  // what the template shows of each
+  kainjow::mustache::list files_;  // the fields of the template for each file
   std::vector<Verdict> verdicts_;
 };
 

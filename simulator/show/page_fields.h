@@ -1,4 +1,4 @@
-// Shared by the parts of the page: texts that are fit to be shown, and lists of bounded length.
+// Shared by the parts of the page: texts that are safe to show, and lists of limited length.
 #pragma once
 
 #include <algorithm>
@@ -11,32 +11,33 @@
 
 namespace simulator {
 
-// Of each file at most so many lines of a kind are shown. The rest are counted. If items are left
-// out, the refused ones go first.
+// At most this many lines of each kind are shown for a file. The rest are only counted. If items
+// are left out, the refused ones are shown first.
 inline constexpr size_t kMostPageLines = 200;
-// Of a text that came from a file at most so many bytes are shown, with "…" for the rest, before
-// they are escaped.
+// At most this many bytes of a text from a file are shown, with "…" for the rest. Bytes are counted
+// before the text is escaped.
 inline constexpr size_t kMostPageText = 400;
-// The same in the table of files, where the file's own part has more.
+// The limit in the table of files. The file's own part of the page shows more.
 inline constexpr size_t kMostCellText = 120;
 
-// Nothing is shown that would deceive the eye. Characters that HTML gives a meaning are escaped
-// where the template is filled in.
+// Replaces characters that could mislead the reader. The special characters of HTML are escaped
+// when the template is filled in.
 kainjow::mustache::data Shown(std::string_view bytes);
 
-// The beginning of what is too long, without a part of a character at its end.
+// Cuts a text that is too long, but not inside a UTF-8 character.
 std::string Short(std::string_view bytes, size_t most = kMostPageText);
 Reason Short(Reason reason);
 Item Short(Item item);
 
-// A section of the template that is shown or not, without fields of its own.
+// A section of the template without fields. It is shown if `condition` is true.
 kainjow::mustache::list OneIf(bool condition);
 
 // Such as "1,234,567".
 std::string Grouped(uint64_t number);
 
-// Sets the section "NAME_shown" with the section `name` in it: what `make` makes of the first
-// lines, and how many there are beyond them.
+// Sets the sections of a list: "NAME_shown" if there are lines, `name` with the fields that `make`
+// returns for the first lines, and "NAME_more" if there are more lines. Sets "NAME_count" to the
+// number of all lines.
 template <typename Lines, typename Make>
 void AddLines(const std::string& name, const Lines& lines, const std::string& remark, Make make,
               kainjow::mustache::data* file) {

@@ -1,4 +1,4 @@
-// The page's table of judgements on a file: the tool's, and that of the phones' installer.
+// The page's table of judgements on a file: that of the tool, and those of the phones' installer.
 #pragma once
 
 #include <kainjow/mustache.hpp>

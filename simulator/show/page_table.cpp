@@ -15,7 +15,8 @@ using kainjow::mustache::data;
 using kainjow::mustache::list;
 using kainjow::mustache::object;
 
-// From the worst to the best: of the first nothing is known, and of the last nothing is wrong.
+// From the worst to the best. Nothing is known about a file with the first verdict. Nothing is
+// wrong with a file with the last one.
 constexpr Verdict kWorstFirst[] = {
     Verdict::kNotSimulated,  Verdict::kNotLookedAt,    Verdict::kRefused,
     Verdict::kNotTrustedJar, Verdict::kNotInstallable, Verdict::kNotAccepted,
@@ -32,8 +33,8 @@ object Choice(const std::string& code, const std::string& word, size_t count);
 
 }  // namespace
 
-// The parts that a file can make long are cut before they are put together: the key stands behind
-// a name of any length.
+// Parts that a file can make long are cut before they are joined. Otherwise a long name could cut
+// off the key that follows it.
 void PageTable::Add(const Report& report) {
   rows_.push_back({rows_.size() + 1, report.file, report.verdict, ReasonText(report),
                    report.warnings.size(), Short(report.package_name, kMostCellText),
@@ -68,7 +69,7 @@ void PageTable::Fill(data* page) const {
   page->set("choice", OneIf(choices.size() > 1));
 }
 
-// One for each verdict that there is, the worst first, and one for the files with warnings.
+// One choice for each verdict in the table, the worst first, and one for the files with warnings.
 list PageTable::Choices() const {
   const auto count = [this](const auto& is_chosen) {
     return static_cast<size_t>(std::count_if(rows_.begin(), rows_.end(), is_chosen));
@@ -116,7 +117,7 @@ size_t RankOf(Verdict verdict) {
                              std::begin(kWorstFirst));
 }
 
-// Why it is not better, or for whom phones install it instead; then the alarms.
+// The decisive reason, or the other signer for whom phones install the package; then the alarms.
 std::string ReasonText(const Report& report) {
   std::vector<std::string> facts = {DecisiveReason(report)};
   if (facts[0].empty()) facts[0] = OtherOwnerText(report);

@@ -12,7 +12,7 @@ namespace simulator {
 
 class PageTable {
  public:
-  // The next file, in the order of the command line.
+  // Adds the next file, in the order of the command line.
   void Add(const Report& report);
 
   // Sets the sections of the table: the directory, the choices and the rows.

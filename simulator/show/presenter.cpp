@@ -25,7 +25,7 @@ constexpr char kEraseLine[] = "\r\x1b[K";
 
 std::string JournalStart() { return Event("journal").Number("version", kJournalVersion).Line(); }
 
-// The report of a file that nothing looked at.
+// The report for a file that was not examined.
 Report Untold(const std::string& file, const Reason& why) {
   Report report;
   report.file = file;
@@ -106,7 +106,7 @@ void Presenter::ShowAnswer(const RunRecord& run, const Report& report, const std
   status_ = std::max(status_, problem.empty() ? status : kCannotSimulate);
 }
 
-// Erased again before anything else is written.
+// This line is erased before anything else is written.
 void Presenter::ShowProgress(const std::string& file, int seconds) {
   if (!has_progress_) return;
   std::cerr << kEraseLine << shown_ << " of " << file_count_ << " done; " << Printable(file, look_)
@@ -136,14 +136,14 @@ int Presenter::Finish(const std::vector<std::string>& files) {
   return EndWith(status_);
 }
 
-// If the run was interrupted: how many files it did not come to.
+// The number of files that the run did not reach; none if the run was not interrupted.
 std::optional<size_t> Presenter::Unseen() const {
   const size_t unseen = file_count_ - shown_;
   if (unseen == 0 && !is_interrupted_) return std::nullopt;
   return unseen;
 }
 
-// No output of an earlier run stays, or it would be taken for this one's.
+// Overwrites all outputs of an earlier run. Otherwise they would look like outputs of this run.
 int Presenter::GiveUp(const std::vector<std::string>& files, const std::string& problem) {
   status_ = Complain(kCannotSimulate, problem);
   for (OutputFile* const file : AllFiles()) {
@@ -166,12 +166,12 @@ void Presenter::WriteReports() {
   Write(&sarif_file_, sarif_.Log());
 }
 
-// An output that has failed gets nothing more, and no second message.
+// After a failure, nothing more is written to this output, and no second message is printed.
 void Presenter::Write(OutputFile* file, std::string_view text) {
   if (file->IsOpen() && !file->Append(text)) FailToWrite(file);
 }
 
-// The journal goes to its file, and to standard output when that is asked for.
+// Writes to the journal's file and, with --json, to standard output.
 void Presenter::Keep(const std::string& journal) {
   if (options_.json) std::cout << journal;
   Write(&journal_, journal);
@@ -197,7 +197,7 @@ int Complain(int status, const std::string& message) {
 
 int EndWith(int status) {
   std::cout.flush();
-  // If the reader ended, the process ends by the signal for that, as other programs do.
+  // If the reader has ended, this process later ends by SIGPIPE, as other programs do.
   if (std::cout || IsInterrupted()) return status;
   return Complain(std::max<int>(status, kCannotSimulate), "cannot write to standard output");
 }

@@ -37,7 +37,7 @@ class Presenter {
   std::optional<std::string> Objection(const std::vector<std::string>& inputs) const;
   // Opens the outputs. Returns none, or why one of them cannot be written: then call GiveUp.
   std::optional<std::string> Begin();
-  // `journal` are the lines of the run, from "start" to "exit".
+  // `journal`: the lines of the run, from "start" to "exit".
   void Show(const Report& report, const std::string& journal);
   // Shows the output of a run of apktoolkit-verify. `report` says why it could not be simulated.
   void ShowAnswer(const RunRecord& run, const Report& report, const std::string& journal);

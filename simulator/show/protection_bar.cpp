@@ -9,7 +9,7 @@ namespace simulator {
 
 namespace {
 
-// Entries may overlap and claim more bytes than the file has; then nothing lies between them.
+// Overlapping entries can together have more bytes than the file. The result is then 0.
 Share Between(const Protection& protection, uint64_t file_size) {
   uint64_t rest = file_size;
   for (const Share* share : {&protection.verified, &protection.vouched, &protection.differing,
@@ -46,7 +46,7 @@ std::vector<DrawnPart> DrawBar(const Protection& protection, uint64_t file_size)
        protection.signature, 0, 0, 0},
       {"between", "between the entries", "headers, directory, padding, newer signing block", false,
        Between(protection, file_size), 0, 0, 0}};
-  // Faults that a package has not got take no line.
+  // Faults that the package does not have are not shown.
   parts.erase(
       std::remove_if(parts.begin(), parts.end(),
                      [](const DrawnPart& part) {

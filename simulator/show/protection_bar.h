@@ -1,4 +1,4 @@
-// How what the signature protects (Protection) is drawn: one bar, and what its parts are.
+// The picture of what the signature protects (Protection): one bar, and the meaning of its parts.
 #pragma once
 
 #include <cstdint>
@@ -9,18 +9,18 @@
 namespace simulator {
 
 struct DrawnPart {
-  const char* code;     // of its look
+  const char* code;     // the ID of its pattern in the page
   const char* name;     // in the legend
-  const char* meaning;  // what is to be known of it
-  bool has_entries;     // else it is what lies between them
+  const char* meaning;  // an explanation
+  bool has_entries;     // else it is the bytes between the entries
   Share share;
   double percent;  // of all bytes
   double start;    // where it is drawn, in percent of the bar's width
-  double width;    // a little more than `percent` for what could hardly be seen; 0: nothing there
+  double width;    // in the same unit; enlarged if it would be hard to see; 0: no bytes
 };
 
-// From what the signature protects best to what lies between the entries. Empty when the file has
-// no entries.
+// Returns the parts in order, from the best protected one to the bytes between the entries. Empty
+// if the file has no entries.
 std::vector<DrawnPart> DrawBar(const Protection& protection, uint64_t file_size);
 
 }  // namespace simulator

@@ -9,7 +9,7 @@ namespace simulator {
 
 namespace {
 
-constexpr size_t kWidth = 80;  // what to do is wrapped to it
+constexpr size_t kWidth = 80;  // in columns; cures are wrapped to it
 constexpr size_t kMostName = 40;
 constexpr Colour kMoodColours[] = {Colour::kGreen, Colour::kYellow, Colour::kRed};
 
@@ -28,7 +28,7 @@ class Printer {
   void PrintChain();
 
  private:
-  // A line with nothing in it that may not be shown.
+  // Prints a line. Characters that must not be shown are escaped.
   void Print(const std::string& text, Colour colour = Colour::kPlain) {
     out_ << Coloured(Printable(text, look_), colour, look_) << '\n';
   }
@@ -142,7 +142,7 @@ void Printer::PrintChain() {
   }
 }
 
-// Wrapped, below what it is said of.
+// Prints the cure, wrapped, below the line to which it belongs.
 void Printer::PrintCure(const Cause& cause) {
   const std::string margin(6, ' ');
   const std::string text = cause.cure;

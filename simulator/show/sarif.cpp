@@ -22,7 +22,7 @@ bool IsRefused(const Item& item) {
 
 bool Follows(const Item& item) { return item.reason.cause->severity == Severity::kFollows; }
 
-// {"text": …}, for those members that are messages.
+// A SARIF message: {"text": …}.
 nlohmann::ordered_json Message(const std::string& text) {
   return {{"text", Printable(text, {false, true})}};
 }
@@ -38,7 +38,7 @@ void Sarif::Add(const Report& report) {
   const size_t index = AddArtifact(report);
   const Json location = {{"physicalLocation",
                           {{"artifactLocation", {{"uri", UriOf(report.file)}, {"index", index}}}}}};
-  // Of refusals that follow from another one there are no results: that one says what to fix.
+  // A refusal that follows from another refusal has no result. The other one says what to fix.
   const bool has_origin =
       std::any_of(report.items.begin(), report.items.end(),
                   [](const Item& item) { return IsRefused(item) && !Follows(item); });
@@ -81,7 +81,7 @@ std::string Sarif::Log() const {
   return TextOf(log, kIndent) + "\n";
 }
 
-// The same file with the same bytes stands there once.
+// Adds the file, unless the log already has it with the same bytes. Returns its index.
 size_t Sarif::AddArtifact(const Report& report) {
   Json artifact = {{"location", {{"uri", UriOf(report.file)}}},
                    {"roles", Json::array({"analysisTarget"})}};
@@ -104,7 +104,7 @@ void Sarif::AddResult(const Cause& cause, const char* level, const std::string& 
                       {"locations", Json::array({location})}});
 }
 
-// The number of the cause's rule, which is added when it is first needed.
+// The index of the cause's rule. Adds the rule at its first use.
 size_t Sarif::RuleOf(const Cause& cause, const char* level) {
   const auto& [place, is_new] = rule_of_.emplace(cause.code, rules_.size());
   if (is_new) {
@@ -116,8 +116,8 @@ size_t Sarif::RuleOf(const Cause& cause, const char* level) {
   return place->second;
 }
 
-// All but unreserved characters and slashes are percent-encoded, so that no part of the path is
-// taken for a scheme, a query or a fragment (RFC 3986 §2.1, §4.2).
+// All characters except unreserved characters and slashes are percent-encoded, so that no part of
+// the path looks like a scheme, a query or a fragment (RFC 3986 §2.1, §4.2).
 std::string UriOf(std::string_view path) {
   constexpr std::string_view kPlain =
       "ABCDEFGHIJKLMNOPQRSTUVWXYZabcdefghijklmnopqrstuvwxyz0123456789-._~/";

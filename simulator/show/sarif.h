@@ -1,8 +1,8 @@
-// The report of a run for what reads the results of static analysis: one SARIF log (OASIS Static
-// Analysis Results Interchange Format, version 2.1.0). Each thing that was refused is a result of
-// level "error", each warning one of level "warning"; the rules are the causes. A file that was not
-// judged is an error, and the run that it belongs to was not successful. All texts from a file are
-// plain text in it.
+// The report of a run for programs that read results of static analysis: one SARIF log (OASIS
+// Static Analysis Results Interchange Format, version 2.1.0). Each refused item is a result of
+// level "error", and each warning is a result of level "warning". The rules are the causes. A file
+// that was not judged is a notification of level "error", and the run then counts as not
+// successful. All texts from a file are escaped.
 #pragma once
 
 #include <map>
@@ -28,7 +28,7 @@ inline constexpr std::string_view kSarifStart =
 
 class Sarif {
  public:
-  // The next file, in the order of the command line.
+  // Adds the next file, in the order of the command line.
   void Add(const Report& report);
 
   // A failure of the run itself, such as another output that cannot be written.
@@ -52,10 +52,10 @@ class Sarif {
   Json results_ = Json::array();
   Json notifications_ = Json::array();
   bool is_successful_ = true;          // each file was judged, and nothing else failed
-  bool is_installer_missing_ = false;  // said once for the whole run
+  bool is_installer_missing_ = false;  // reported once for the whole run
 };
 
-// The file as an URI reference (RFC 3986 §4.1): of an absolute path the whole URI.
+// The path as a URI reference (RFC 3986 §4.1). An absolute path becomes a "file" URI.
 std::string UriOf(std::string_view path);
 
 }  // namespace simulator

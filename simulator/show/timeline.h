@@ -1,4 +1,4 @@
-// The readable form of what happened, line by line and in order; nothing is left out.
+// The events of a run in a readable form, line by line and in order.
 #pragma once
 
 #include <ostream>
@@ -10,11 +10,11 @@
 
 namespace simulator {
 
-// How one thing that happened reads; texts come as they are.
+// An event in readable form. Its texts are not escaped.
 struct TimelineLine {
   std::string what;  // such as "sign"
   std::string text;
-  std::string detail;  // for a line of its own below; mostly empty
+  std::string detail;  // shown on a separate line below; mostly empty
   bool is_failure = false;
 };
 

@@ -100,7 +100,8 @@ std::string NamesJson(const std::vector<std::string>& names) {
   return List(names, [](const std::string& name) { return EncodeText(name); });
 }
 
-// The result of comparing the entries with the manifest, and the number at which the tool looked.
+// The result of comparing the entries with the manifest, and the number of entries that the tool
+// looked at.
 std::string EntriesJson(const Protection& all) {
   const auto share = [](const Share& counted, Members members) {
     members.insert(members.begin(), {{"entries", std::to_string(counted.entries)},

@@ -28,8 +28,9 @@ const VerdictWords& WordsOf(Verdict verdict);
 // "good", "mixed" or "bad", for programs.
 const char* MoodCode(Mood mood);
 
-// Returns a text such as "3 files: 1 signed, 2 refused". For an interrupted run, which has
-// `unseen`, it also says so, with that number of files that were not reached.
+// Returns a text such as "3 files: 1 signed, 2 refused". For an interrupted run, `unseen` is the
+// number of files that were not reached. The text then also reports the interruption and this
+// number.
 std::string Summary(const std::vector<Verdict>& verdicts, std::optional<size_t> unseen = {});
 
 // The owner of the package: its name, the signer and the key and, if phones install it for another
@@ -48,7 +49,7 @@ std::vector<std::string> AlarmFacts(const Report& report);
 // The reason of the item that decides the verdict; empty if nothing was refused.
 std::string DecisiveReason(const Report& report);
 
-// Tells that the phones' installer was not asked because its verifier is missing; empty otherwise.
+// The message that the phones' installer was not asked because its verifier is missing; else empty.
 std::string MissingInstaller(const Report& report);
 
 // The facts after the file's name in the verdict's line: the decisive reason or, if nothing was
@@ -72,7 +73,7 @@ std::string NameOf(const Item& item);
 // The item's result and its reason; `verdict` is its report's.
 std::string OutcomeOf(const Item& item, Verdict verdict);
 
-// Where the tool found the file.
+// The path at which the tool found the file.
 inline const std::string& PathForTool(const Report& report) {
   return report.installed.empty() ? report.path : report.installed;
 }
@@ -88,7 +89,8 @@ bool HasCure(const Item& item, const Item* next);
 // The text at the link, or "not reached" beyond a break.
 std::string TextOf(const Link& link);
 
-// Label and value for each fact. The labels are those of apksigner, so that one search finds both.
+// Label and value for each fact. The labels are those of apksigner, so that one search finds both
+// outputs.
 using Rows = std::vector<std::pair<std::string, std::string>>;
 // The facts of a certificate, as readers other than the tool find them.
 Rows CertificateRows(const CertificateFacts& certificate);

@@ -9,14 +9,14 @@ namespace simulator {
 // The subject of a cause.
 enum class Group {
   kNotLookedAt,  // the tool did not look at the file
-  kSimulation,   // the simulation could not tell
+  kSimulation,   // the simulation has no result
   kFile,         // the kind of the file
   kSignature,    // a package's signature
   kKernel,
   kLibrary,
   kKey,
   kTool,
-  kInstaller,  // a phone's installer would not take the package
+  kInstaller,  // a phone's installer does not install the package
   kGate,       // the command line demands something else
   kWarning,    // a fact that deserves a second look, even if everything was signed
 };
@@ -79,7 +79,7 @@ inline constexpr Cause kNoPackages = {"no-packages", Group::kNotLookedAt, Severi
     "--recursive takes .apk, .jar, .apks, .xapk, .apkm and .aab. Name other files one by one, or "
     "with --files-from."};
 
-// ---- The simulation could not tell.
+// ---- The simulation has no result.
 inline constexpr Cause kToolNotStarted = {"tool-not-started", Group::kSimulation, Severity::kFailed,
     ChainLink::kKey, "", "%s", "Check --tool and --runner."};
 inline constexpr Cause kToolTimedOut = {"tool-timed-out", Group::kSimulation, Severity::kFailed,

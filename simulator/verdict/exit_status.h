@@ -1,4 +1,4 @@
-// The exit statuses, for scripts. Of several files, the highest counts.
+// The exit statuses, for scripts. For several files, the highest one counts.
 #pragma once
 
 namespace simulator {

@@ -51,7 +51,8 @@ void Gate::Judge(Report* report) {
   if (options_.refuses_warnings && is_good) DemandNoWarnings(is_other_signers, report);
 }
 
-// The signer is known where the tool verified the signature. Elsewhere the file only claims one.
+// The signer is known only if the tool verified the signature. Otherwise the file only claims a
+// signer.
 void Gate::DemandExpectedSigner(Report* report) const {
   std::string expected;
   for (const std::string& digest : options_.signers) {
@@ -150,8 +151,8 @@ std::vector<const CertificateFacts*> NewestSigners(const RangeJudgement& range) 
   return signers;
 }
 
-// The signers by whom any of the phones knows the package, each once, in a fixed order. If the
-// installer was not asked: those of the newest scheme that the file names.
+// The signers for whom any of the phones installs the package, each once, in a fixed order. If the
+// installer was not asked, these are the signers of the newest scheme that the file names.
 Signers InstalledSigners(const Report& report) {
   Signers signers;
   for (const RangeJudgement& range : report.installer.ranges) {

@@ -18,8 +18,9 @@ struct GateOptions {
   bool refuses_warnings = false;
 };
 
-// Returns a SHA-256 digest in lower-case hexadecimal. Takes the forms in which tools print it: in
-// upper or lower case, with a colon after every two digits or without. None for anything else.
+// Returns a SHA-256 digest in lower-case hexadecimal. Accepts the forms in which tools print it: in
+// upper or lower case, with colons between the pairs of digits or without colons. Returns none for
+// any other text.
 std::optional<std::string> ReadDigest(const std::string& text);
 
 class Gate {

@@ -1,4 +1,4 @@
-// The item for the judgement of the phones' installer. The other items are the tool's.
+// The item for the judgement of the phones' installer.
 #include <algorithm>
 
 #include "simulator/verdict/parts.h"
@@ -84,8 +84,8 @@ std::string LevelsText(const std::vector<RangeJudgement>& ranges, bool is_verifi
   return Joined(texts);
 }
 
-// Sentences for the most frequent faults. "%s" stands for the issue's parameter of that number,
-// such as the entry's name. All other faults are reported in apksig's own sentence.
+// Sentences for the most frequent faults. "%s" is replaced by the issue's parameter with the index
+// `parameter`, such as the entry's name. All other faults are reported in apksig's own sentence.
 constexpr struct {
   const char* issue;
   size_t parameter;

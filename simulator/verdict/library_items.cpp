@@ -26,7 +26,7 @@ Reason WhyNotThere(const LibraryFacts& library, const RunRecord& run, const Pack
 void AddLibraryItems(const RunRecord& run, const PackageFacts& facts, const JudgeOptions& options,
                      std::vector<Item>* items) {
   const bool is_walked = run.own || !run.libraries.empty();
-  // The entries of a plain JAR are not libraries. But each attempt of the tool gets its item.
+  // The entries of a plain JAR are not libraries. Each attempt of the tool still gets an item.
   const bool is_package = items->front().kind == ItemKind::kPackage;
   for (const Library& library :
        MatchAttempts(run, is_package ? facts.libraries : std::vector<LibraryFacts>())) {

@@ -152,7 +152,7 @@ Reason WhyJarRefused(const RunRecord& run, const PackageFacts& facts) {
   return {&cause::kJarNotTrusted, DescribeErrno(run.verify_error.value_or(0))};
 }
 
-// A null cause when nothing failed.
+// A null cause if nothing failed.
 Reason WhyFailed(const Failure& failure) {
   constexpr const Cause* kCauses[] = {nullptr,
                                       &cause::kToolNotStarted,
@@ -181,9 +181,9 @@ void AddKeyItems(const RunRecord& run, const JudgeOptions& options, std::vector<
   if (run.has_no_key_path) add("", {&cause::kRegistrationNoPath, ""});
 }
 
-// All other failures. A message that was logged while the file was opened is the reason why a
-// package was refused, or names the part that a JAR lacks of a package. Beside a signed package it
-// is a failure of its own.
+// Adds all other failures. A message from the opening of the file usually explains why a package
+// was refused, or which part of a package a JAR does not have. If the package was signed
+// nevertheless, the message is a separate failure.
 void AddToolItems(const RunRecord& run, const JudgeOptions& options, std::vector<Item>* items) {
   const auto add = [&](const Reason& reason) {
     items->push_back(NotDone(ItemKind::kTool, "tool", reason, options));
@@ -199,7 +199,7 @@ void AddToolItems(const RunRecord& run, const JudgeOptions& options, std::vector
   }
 }
 
-// By what the tool did alone. The first item is the file itself.
+// The verdict on the tool's own items alone. The first item is the file itself.
 Verdict Judge(const std::vector<Item>& items) {
   const auto is_refused = [](const Item& item) {
     return item.state == ItemState::kRefused && IsByTool(item);
@@ -216,7 +216,7 @@ Verdict Judge(const std::vector<Item>& items) {
   return is_partly ? Verdict::kPartlySigned : Verdict::kRefused;
 }
 
-// Where the tool signed something, it counts what the phones' installer does with it.
+// If the tool signed something, the judgement of the phones' installer counts as well.
 Verdict JudgeWithInstaller(Verdict verdict, const Report& report) {
   if (verdict != Verdict::kSigned && verdict != Verdict::kPartlySigned) return verdict;
   for (const Item& item : report.items) {
@@ -228,8 +228,8 @@ Verdict JudgeWithInstaller(Verdict verdict, const Report& report) {
   return verdict == Verdict::kSigned && has_other ? Verdict::kOtherSigner : verdict;
 }
 
-// The key is the one that the kernel got with the package, or else with a library. Where it got
-// none, it is the one that the tool's own code reads from the file.
+// The key is the one that the kernel got with the package, or else with a library. If the kernel
+// got none, the key is the one that the tool's own code reads from the file.
 void DescribeSigners(const RunRecord& run, const PackageFacts& facts, Report* report) {
   constexpr char kDigestFollows[] = "2000";  // 32, the low byte first
   const auto take = [report](const Attempt& attempt) {

@@ -26,7 +26,7 @@ std::string FirstSignatureFile(const JarSignatureFacts& jar);
 
 }  // namespace
 
-// In the order in which the tool checks.
+// Looks for reasons in the order in which the tool checks.
 Reason WhyRefused(const RunRecord& run, const PackageFacts& facts) {
   const Lines& errors = run.opening_errors;
   const JarSignatureFacts& jar = facts.jar;
@@ -120,7 +120,7 @@ Reason WhyNoBlock(const std::string& name, const JarSignatureFacts& jar) {
   return {&cause::kSignatureBlockUnreadable, name};
 }
 
-// A block of a key that is not RSA's, or one that does not parse.
+// The reason for a block with a key that is not an RSA key, or for a malformed block.
 Reason OfOtherKey(const JarSignatureFacts& jar) {
   if (jar.certificate && jar.certificate->key.algorithm == "EC") return {&cause::kEcKey, ""};
   if (jar.certificate && jar.certificate->key.algorithm == "DSA") return {&cause::kDsaKey, ""};

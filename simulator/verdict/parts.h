@@ -20,8 +20,8 @@ Reason WhyNotLookedAt(const RunRecord& run, const PackageFacts& facts);
 // or a set of packages, or has parts of a package. A null cause if it may be a JAR.
 Reason WhyTakenForAJar(const PackageFacts& facts);
 
-// The reason for a file that the tool refused if an entry that the tool reads is encrypted: one of
-// the JAR signature, AndroidManifest.xml or classes.dex. A null cause if none is.
+// Why the tool refused a file, if the tool reads an encrypted entry: an entry of the JAR signature,
+// AndroidManifest.xml or classes.dex. A null cause if none of these is encrypted.
 Reason WhyEncrypted(const PackageFacts& facts);
 
 // Why the kernel did not sign the file; a null cause if it did.
@@ -36,7 +36,7 @@ void AddLibraryItems(const RunRecord& run, const PackageFacts& facts, const Judg
 void AddInstallerItem(const Judgement& judgement, const JudgeOptions& options,
                       std::vector<Item>* items);
 
-// True if the key is the JAR signer's: the same as the kernel gets and as the certificate shows.
+// True if the key is the JAR signer's: the key that the kernel gets and that the certificate shows.
 bool IsJarSigner(const PublicKey& key, const Report& report);
 
 // Facts that matter to the user although they change nothing for the kernel. Reads only the items,
@@ -49,8 +49,8 @@ std::vector<Reason> FindWarnings(const RunRecord& run, const PackageFacts& facts
 // package's own first.
 Protection FindProtection(const PackageFacts& facts, const std::vector<Item>& items);
 
-// The chain from the key to the entries. It breaks at the link of the first item, package or
-// library, whose cause has one. All members of the report except the chain must be filled.
+// The chain from the key to the entries. It breaks at the first item, the package or a library,
+// whose cause breaks a link. All members of the report except the chain must be filled.
 std::vector<Link> MakeChain(const PackageFacts& facts, const Report& report);
 
 }  // namespace simulator

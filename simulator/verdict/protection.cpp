@@ -10,7 +10,7 @@ namespace simulator {
 
 namespace {
 
-// At which entries the tool looked, and whether it found them as they are listed. Of a library it
+// The entries that the tool looked at; true if they match the manifest. For a library, the tool
 // looks at the file beside the package.
 std::map<std::string, bool> EntriesSeen(const std::vector<Item>& items) {
   std::map<std::string, bool> seen;

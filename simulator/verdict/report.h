@@ -129,11 +129,12 @@ struct Report {
 // The refused item that decides the verdict, mostly the first one; null if nothing was refused.
 const Item* DecisiveItem(const Report& report);
 
-// A signer for whom the newest phones that take the package install it, if that signer is not the
-// JAR's; null if all are the JAR's. Reads only the signer and the key of the report.
+// The newest phones that install the package may install it for another signer than the JAR's.
+// Returns such a signer, or null if there is none. Reads only the signer and the key of the report.
 const CertificateFacts* OtherSigner(const Judgement& judgement, const Report& report);
 
-// True for an item of the tool's own run. The others are the installer's and the command line's.
+// True for an item of the tool's own run. The others belong to the installer or to the command
+// line.
 bool IsByTool(const Item& item);
 
 // The exit status for a verdict.
