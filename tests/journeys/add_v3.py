@@ -34,7 +34,8 @@ def main(path, certificate, key, first, last, scheme=V3):
     directory = struct.unpack_from("<I", data, end + 16)[0]
     has_block = data[directory - 16:directory] == MAGIC
     start = directory - struct.unpack_from("<Q", data, directory - 24)[0] - 8 if has_block else directory
-    # The signed end has the offset that the directory has without the block.
+    # The digest covers the end record with the offset of the signing block in place of that of the
+    # directory.
     signed_end = data[end:end + 16] + struct.pack("<I", start) + data[end + 20:]
     digest = content_digest([data[:start], data[directory:end], signed_end])
 

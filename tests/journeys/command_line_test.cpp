@@ -1,4 +1,4 @@
-// How the tool is started, and what keeps it from starting on a file.
+// The tool's command line, and the files for which the tool ends without doing anything.
 #include <gtest/gtest.h>
 
 #include <cerrno>
@@ -45,7 +45,7 @@ TEST_F(CommandLine, MissingFileEndsSilently) {
   EXPECT_EQ(run.status, 4);  // the file was not looked at
 }
 
-// In a user namespace of its own the tool has no right to another user's files, not even as root.
+// In its own user namespace, the tool has no right to another user's files, even as root.
 TEST_F(CommandLine, FileThatMayNotBeReadEndsSilently) {
   if (!CanMakeNamespaces()) GTEST_SKIP() << kNoNamespaces;
   std::filesystem::permissions(apk_, std::filesystem::perms::none);
@@ -81,12 +81,12 @@ TEST_F(CommandLine, FileOnTheSameFileSystemWritableIsWorkedOn) {
             Timeline({LibraryStep({Log(6, "Can't open file: " + library + "\n"),
                                    Log(6, "VeltSignJni: File not verified: " + library + "\n")}),
                       PackageStep(apk), Exit(0)}));
-  EXPECT_EQ(run.status, 0);  // what is not there is not refused
+  EXPECT_EQ(run.status, 0);  // a missing library is not refused
 }
 
-// The log as the workstation's library prints it, less the time and the process: a letter for the
-// priority, then the text. The library puts the tag before the time up to level 29, and after it
-// later.
+// The log that the workstation's log library prints, without the times and the process IDs: for
+// each record a letter for the priority, then the text. Up to API level 29, the library prints the
+// tag before the time. Later versions print it after the time.
 std::string WorkstationLog(const std::string& errors) {
   const std::string when = "[0-9]+-[0-9]+ [0-9:.]+ +[0-9]+ +[0-9]+ ";
   return std::regex_replace(

@@ -1,5 +1,5 @@
-// The simulator as the gate of a pipeline: whose a package must be, warnings that count as
-// refusals, and what a program is told of all that. Digests are those that openssl prints.
+// The simulator as the gate of a pipeline: expected signers, warnings that count as refusals, and
+// the journal that a program reads. openssl computes the expected digests.
 #include <gtest/gtest.h>
 
 #include <filesystem>
@@ -20,7 +20,8 @@ std::string Golden(const std::string& name) { return std::string(GOLDEN_PACKAGES
 
 std::string Apk(const std::string& name) { return Golden(name) + "/base.apk"; }
 
-// The output of a shell command, without its line end; $0 is the certificate of the test key.
+// The output of a shell command, without its line end. In the command, $0 is the certificate of the
+// test key.
 std::string OfCertificate(const std::string& key, const std::string& command) {
   const ProcessResult run =
       RunProcess({"bash", "-o", "pipefail", "-c", command, Golden(key + ".pem")});
@@ -30,7 +31,7 @@ std::string OfCertificate(const std::string& key, const std::string& command) {
   return text;
 }
 
-// In capitals, with colons.
+// In hexadecimal, in capitals and with colons.
 std::string CertificateDigest(const std::string& key) {
   return OfCertificate(key, "openssl x509 -in \"$0\" -noout -fingerprint -sha256 | sed s/.*=//");
 }
@@ -53,7 +54,7 @@ ProcessResult Simulated(const Lines& words) {
   return RunProcess(command);
 }
 
-// The verdicts of the files, then the status; no installer is asked, unless the words say so.
+// The verdicts of the files, then the status. No installer is asked, unless `words` turn it on.
 Lines Verdicts(Lines words) {
   words.insert(words.begin(), {"--installer=off", "--quiet"});
   const ProcessResult run = Simulated(words);
@@ -78,7 +79,7 @@ std::vector<json> Events(Lines words) {
   return events;
 }
 
-// The codes of the warnings of a package that a test has made.
+// The codes of the warnings about a package.
 Lines WarningsOf(const Package& package, const Lines& options = {}) {
   const TempDir directory;
   package.WriteTo(directory / "base.apk");
@@ -125,7 +126,8 @@ TEST(Signer, WhoWasNotExpectedStandsInFirstLineItemAndJournal) {
   EXPECT_NE(item["text"].get<std::string>().find(PublicKeyDigest("rsa-2048")), std::string::npos);
 }
 
-// Phones from API 28 on install it for the second key, and the kernel gets the first.
+// Phones of API 28 and later install the package for the second key, but the kernel gets the first
+// key.
 TEST(Signer, OfTheNewestSchemeIsAskedOfTheInstaller) {
   const Lines first = {"--signer", ModulusDigest("rsa-2048")};
   const auto verdicts = [&](const Lines& more) {
@@ -161,7 +163,7 @@ TEST(Signer, OfATrustedJarIsNobody) {
 TEST(FilesOfOnePackage, MustHaveOneSigner) {
   EXPECT_EQ(Verdicts({Apk("apksigner-sha256-2048"), Apk("apksigner-sha1-2048")}),
             Lines({"SIGNED", "SIGNED", "-> 0"}));
-  // In their order, however many are looked at at a time.
+  // The files are compared in their order, also if several are processed at a time.
   for (const char* jobs : {"--jobs=1", "--jobs=4"}) {
     EXPECT_EQ(Verdicts({jobs, Apk("apksigner-sha256-4096"), Apk("apksigner-sha256-2048"),
                         Apk("apksigner-sha1-4096")}),
@@ -227,7 +229,7 @@ TEST(Warning, OfAShortKeyOrADebugCertificate) {
   EXPECT_EQ(WarningsOf(MakePackage(options)), Lines({"debug-key"}));
 }
 
-// As coreutils and openssl have them.
+// The expected values are those of coreutils and openssl.
 TEST(Verdict, TellsWhatAProgramHasToKnowOfFileToolAndSigner) {
   const auto sha256 = [](const std::string& file) {
     return RunProcess({"sha256sum", file}).output.substr(0, 64);

@@ -53,7 +53,7 @@ TEST_P(GoldenPackage, IsSignedWithItsLibrariesAndRegistered) {
 
   std::string first = directory + "/lib/arm64/libvault.so";
   std::string second = directory + "/lib/arm/libvault.so";
-  // The zip library's order of entries is its own.
+  // The zip library chooses the order of the entries.
   if (run.timeline.find(second) < run.timeline.find(first)) std::swap(first, second);
   EXPECT_EQ(run.timeline,
             Timeline({LibraryStep({SignedLibrary(first, payload), SignedLibrary(second, payload)}),
@@ -69,7 +69,7 @@ INSTANTIATE_TEST_SUITE_P(By, GoldenPackage,
                                          "openssl-cms-md5", "openssl-cms-keyid"),
                          TestName);
 
-// The output of a command line about the package, whose directory it gets as $0.
+// The output of a shell command, in which $0 is the directory of the package.
 std::string Told(const std::string& name, const std::string& command) {
   const ProcessResult run = RunProcess({"sh", "-c", command, Golden(name)});
   EXPECT_EQ(run.status, 0) << run.errors;
@@ -89,7 +89,7 @@ bool Contains(const std::string& text, const std::string& part) {
   return text.find(part) != std::string::npos;
 }
 
-// The options that the packages were made with have had the effect that their names speak of.
+// The options that made the packages had the effect that the names of the packages state.
 TEST(GoldenPackages, AreWhatTheirNamesSay) {
   for (const char* name : {"apksigner-sha1-2048", "apksigner-sha1-4096"}) {
     EXPECT_TRUE(Contains(Manifest(name), "\nSHA1-Digest: ")) << name;
@@ -115,7 +115,7 @@ void ExpectRefusalAfter(const std::string& name, std::initializer_list<std::stri
 
 class BlockWithAttributes : public testing::TestWithParam<const char*> {};
 
-// The element after the attributes is taken for the signature, and no padding comes out of it.
+// The tool reads the element after the attributes as the signature, and refuses its padding.
 TEST_P(BlockWithAttributes, IsRefused) {
   ASSERT_TRUE(Contains(BlockStructure(GetParam()), ":messageDigest"));
 

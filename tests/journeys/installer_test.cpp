@@ -1,5 +1,5 @@
-// The judgement of the phones' installer beside the tool's: real packages, and the lines that a
-// person reads about them.
+// The judgement of the phones' installer beside that of the tool, for real packages: the lines that
+// a person reads.
 #include <gtest/gtest.h>
 
 #include <sys/stat.h>
@@ -59,8 +59,8 @@ TEST(Installer, TakesWhatApksignerSigned) {
             Lines({"SIGNED", "phones of API 27 and later install it, verified by v1", "-> 0"}));
 }
 
-// The tool does not look at AndroidManifest.xml, so that anybody can put another app's signature
-// around his own.
+// The tool does not check the digest of AndroidManifest.xml. Anybody can therefore put another
+// AndroidManifest.xml under the signature of an app.
 TEST(Installer, RefusesAForeignManifestUnderTheVictimsSignature) {
   EXPECT_EQ(Told("foreign-manifest"),
             Lines({"NOT INSTALLABLE",
@@ -76,7 +76,7 @@ TEST(Installer, RefusesAPackageWithoutItsDex) {
                                         "-> 1"}));
 }
 
-// The tool looks at the library beside the package.
+// The tool checks the library beside the package, and not the one inside.
 TEST(Installer, RefusesALibraryChangedInsideThePackage) {
   EXPECT_EQ(Told("changed-inside"),
             Lines({"NOT INSTALLABLE",
@@ -100,7 +100,7 @@ TEST(Entries, AreComparedByTheToolsOwnCodeWhereNobodyAsksAnInstaller) {
   EXPECT_EQ(without["warnings"][0]["reason"], "entries-missing");
 }
 
-// The library beside the package came from it a moment ago: nobody changed it there.
+// The simulator has just extracted the library from the package, so nobody changed it after that.
 TEST(Entries, LibraryChangedInsideThePackageIsNotBlamedOnTheInstallation) {
   const json event = VerdictOf("changed-inside", {"--installer=off", "--install"});
   EXPECT_EQ(event["verdict"], "partly-signed");
@@ -111,8 +111,8 @@ TEST(Entries, LibraryChangedInsideThePackageIsNotBlamedOnTheInstallation) {
   EXPECT_EQ(event["entries"]["differing"]["looked_at"], 1);
 }
 
-// A fault of the package, and not one that the verifier does not survive. The length of an entry is
-// in its local header, and in the record of the central directory.
+// The verifier reports this fault of the package, and does not give up. The length of an entry is
+// in its local header and in its central directory header.
 TEST(Installer, RefusesAnEntryThatIsLongerThanItSays) {
   const TempDir directory;
   const ProcessResult made = RunProcess({"bash", "-e", "-c", R"(cp -r "$0"/* .
@@ -135,7 +135,7 @@ open("base.apk", "wb").write(data)')",
       << run.output << run.errors;
 }
 
-// Phones of API 27 go by v2, newer ones by v3.
+// Phones of API 27 verify v2, and later phones verify v3.
 TEST(Installer, RefusesWhatWasChangedUnderANewerSignature) {
   for (const char* name : {"commented", "changed-inside-v2"}) {
     EXPECT_EQ(
@@ -176,12 +176,13 @@ TEST(Installer, AnotherSignerIsSaidInTheVerdict) {
   EXPECT_EQ(Told("two-signers"),
             Lines({"SIGNED, OTHER SIGNER", "phones of API 27 and later install it, verified by v2",
                    "-> 0"}));
-  // Phones before API 28 know v2 alone, which the first key made.
+  // Phones before API 28 know only v2, which is made with the first key.
   EXPECT_EQ(Told("rotated-key", {"--api", "27"}),
             Lines({"SIGNED", "phones of API 27 install it, verified by v2", "-> 0"}));
 }
 
-// The verifier names one signer for all levels that it is asked about at once: the first key's.
+// If the verifier is asked about all levels at once, it names one signer for all of them: that of
+// the first key.
 TEST(Installer, SignerForLaterPhonesAloneIsFound) {
   const Lines told = Told("later-v3");
   EXPECT_EQ(told.front(), "NOT INSTALLABLE");
@@ -196,8 +197,8 @@ TEST(Installer, SignerForLaterPhonesAloneIsFound) {
                    "-> 0"}));
 }
 
-// Phones of API 27 take v2, and later phones take v3, and both verify. But the signer of v3 has no
-// lineage from the signer of v2.
+// Phones of API 27 verify v2, and later phones verify v3. Both signatures are correct, but the
+// signer of v3 has no lineage from the signer of v2.
 TEST(Installer, RefusesAV3SignerWithoutALineageFromTheV2Signer) {
   const Lines told = Told("foreign-v3");
   EXPECT_EQ(told.front(), "NOT INSTALLABLE");
@@ -236,7 +237,7 @@ TEST(Installer, JournalHasTheWholeAnswer) {
   const json taken = VerdictOf("apksigner-sha256-2048");
   EXPECT_EQ(taken["verdict"], "signed");
   EXPECT_EQ(taken["installer"]["state"], "judged");
-  // API 27 goes by v2, and all later ones by v3.
+  // Phones of API 27 verify v2, and all later phones verify v3.
   ASSERT_EQ(taken["installer"]["levels"].size(), 2U);
   const json& before = taken["installer"]["levels"][0];
   EXPECT_EQ(before["first"], 27);
@@ -261,7 +262,7 @@ TEST(Installer, JournalHasTheWholeAnswer) {
   EXPECT_EQ(error["parameters"][0], "AndroidManifest.xml");
 }
 
-// An answer is one line of JSON, be the names of the entries as they may.
+// An answer is one line of JSON for any names of entries.
 TEST(Installer, OddNamesDoNotBreakTheAnswer) {
   const TempDir directory;
   const ProcessResult made = RunProcess({"python3", "-c", R"(
@@ -277,8 +278,7 @@ with zipfile.ZipFile("base.apk", "a") as archive:
   EXPECT_EQ(run.output.substr(0, 17), "NOT INSTALLABLE  ") << run.output << run.errors;
 }
 
-// Java is missing, too, and no line says so.
-// The verifier starts late, when the tool's run is long over. Its answer is about other bytes.
+// The verifier starts late, after the tool's run has ended. Its answer is about other bytes.
 TEST(Installer, FileThatChangesBeforeItsAnswerHasNoResult) {
   const TempDir directory;
   const std::string apk = directory / "base.apk";
@@ -297,6 +297,7 @@ TEST(Installer, FileThatChangesBeforeItsAnswerHasNoResult) {
   EXPECT_EQ(told_with("ln '" + apk + "' '" + apk + ".link'").status, 0);
 }
 
+// Java is missing, and no message says so.
 TEST(Installer, IsNotAskedAboutAJar) {
   const TempDir directory;
   const ProcessResult made = RunProcess(

@@ -24,7 +24,7 @@ void WriteJar(const std::string& path) {
   MakePackage(options).WriteTo(path);
 }
 
-// A directory on a file system that keeps extended attributes of users.
+// A directory on a file system that supports extended attributes with names user.*.
 std::string PlaceForAttributes() {
   for (const char* place : {"/tmp", "/var/tmp", "/dev/shm", "."}) {
     const TempDir directory(place);
@@ -39,8 +39,8 @@ void SetAttribute(const std::string& path, const std::string& value) {
   ASSERT_EQ(setxattr(path.c_str(), "user.zu", value.data(), value.size(), 0), 0) << strerror(errno);
 }
 
-// The key block that a JAR is registered with: four digests, the first of its path, each other of
-// the one before.
+// The key block that is registered for a JAR: four SHA-256 digests. The first is the digest of the
+// path, and each other one is the digest of the digest before it.
 Bytes KeyBlock(const std::string& path) {
   Bytes block(4 * SHA256_DIGEST_LENGTH);
   SHA256(reinterpret_cast<const uint8_t*>(path.data()), path.size(), &block[0]);
@@ -258,7 +258,7 @@ std::string ZipRefusal(const std::string& path) {
   return std::to_string(result) + ": " + ErrorCodeString(result);
 }
 
-// No library opens one, and each has another code for it.
+// No version of the zip library opens a directory, but the versions return different codes.
 TEST(OtherFile, ThatIsADirectoryIsRefusedByEachStep) {
   const TempDir directory;
   const std::string refusal = ZipRefusal(directory.path());

@@ -1,4 +1,5 @@
-// Directories and lists of files, as a pipeline hands them over: what is run, told and counted.
+// Directories and lists of files, as a pipeline passes them: the files that the tool is run for,
+// and how they are reported and counted.
 #include <gtest/gtest.h>
 
 #include <filesystem>
@@ -14,7 +15,8 @@ namespace {
 namespace fs = std::filesystem;
 using Lines = std::vector<std::string>;
 
-// A shop of two good packages, and one that nobody signed.
+// A directory `good` with a good package, and a directory `shop` with two good packages and one
+// unsigned package.
 class ManyFiles : public testing::Test {
  protected:
   ManyFiles() {
@@ -27,7 +29,7 @@ class ManyFiles : public testing::Test {
     directory_.Write("shop/notes.txt", ToBytes("notes"));
   }
 
-  // Runs it in the shell, where "sim" is the simulator.
+  // Runs `script` in the shell. In the script, "sim" runs the simulator.
   ProcessResult Do(const std::string& script, const Lines& before = {}) const {
     Lines command = before;
     command.insert(
@@ -37,7 +39,7 @@ class ManyFiles : public testing::Test {
     return RunProcess(command, directory_.path());
   }
 
-  // The verdicts without the signer, and the status; then what stands on standard error.
+  // The verdicts without the signer, then the status, then the text on standard error.
   static Lines Told(const ProcessResult& run) {
     Lines lines;
     std::istringstream text(run.output);
@@ -79,7 +81,7 @@ TEST_F(ManyFiles, DirectoryWithoutRecursiveIsRefusedWithTheCure) {
             std::string::npos);
 }
 
-// The tool looked at nothing there, so the run must fail.
+// The tool looked at no file there, so the run must fail.
 TEST_F(ManyFiles, DirectoryWithoutPackagesIsNoSuccess) {
   fs::create_directory(directory_ / "empty");
   ASSERT_EQ(Told(Do("sim --recursive good empty --journal journal")),
@@ -120,8 +122,8 @@ TEST_F(ManyFiles, ListThatNamesNothingIsNoSuccess) {
                    "directory\n"}));
 }
 
-// The name of the directory in which a package is laid out differs each time, and stays hidden.
-// Only the process's number and the date of the run differ.
+// A package is laid out in a directory with another name each time, but no output contains this
+// name. Only the process ID and the date of the run differ.
 TEST_F(ManyFiles, TwoRunsOverTheSameFileTellTheSame) {
   const std::string both =
       "for run in 1 2; do sim --journal $run.journal --html $run.html good/base.apk; "
@@ -145,7 +147,8 @@ TEST_F(ManyFiles, TwoRunsOverTheSameFileTellTheSame) {
   }
 }
 
-// A name with the placeholder in it is told as it is: no path of a file's begins so.
+// A name with the placeholder in it is shown unchanged. It is not ambiguous, because a resolved
+// path begins with a slash.
 TEST_F(ManyFiles, NameThatLooksLikeAnInstallationIsTold) {
   const ProcessResult run =
       Do("mkdir '<install>'; cp good/base.apk '<install>'/; sim --journal journal "
@@ -156,7 +159,7 @@ TEST_F(ManyFiles, NameThatLooksLikeAnInstallationIsTold) {
             std::string::npos);
 }
 
-// It is the user's.
+// The list is a file of the user.
 TEST_F(ManyFiles, ListIsNotOverwritten) {
   const ProcessResult run =
       Do("echo good/base.apk >list; sim --files-from list --journal list; cat list");

@@ -1,4 +1,4 @@
-// The same good package on phones that are not quite healthy: what the kernel and libzu answer.
+// One good package on phones with faults: different answers of the kernel and of libzu.
 #include <gtest/gtest.h>
 
 #include <cerrno>
@@ -31,14 +31,14 @@ class GoodPackageOn : public testing::Test {
   const std::string library_ = directory_.Write("lib/arm64/libfoo.so", ToBytes("\177ELF foo"));
 };
 
-// One refused signature: what leads up to the message (the kernel's part) differs.
+// One refused signature. `kernels_part` has the events of the kernel before the message.
 std::string Refusal(const std::string& kernels_part, int error) {
   return Timeline({Log(4, "VeltSignOat: Apk case.\n"), kernels_part,
                    Log(6, "VELT can't sign a file (result=10000, errno " + std::to_string(error) +
                               ": " + strerror(error) + ").\n")});
 }
 
-// Both signatures refused; what the kernel's part is for each.
+// Both signatures refused, each with its own events of the kernel.
 std::string BothRefused(const std::string& library_part, const std::string& package_part,
                         int error) {
   return Timeline({LibraryStep({Refusal(library_part, error)}),
@@ -75,8 +75,8 @@ TEST_F(GoodPackageOn, APhoneWithoutIntegrityFilesIsNotSigned) {
   EXPECT_EQ(run.status, 1);
 }
 
-// The timeline with the values of errno blotted out, for refusals that no system call made: errno
-// is then what some earlier call left.
+// The timeline without the values of errno. If no system call refused, errno has the value that
+// some earlier call left.
 std::string WithoutErrno(const std::string& timeline) {
   return std::regex_replace(timeline, std::regex("errno [0-9]+: [^)]*"), "errno");
 }

@@ -22,8 +22,9 @@ inline std::string ByRsa2048() {
 
 inline constexpr size_t kAll = 1000;
 
-// The first lines of all, and the status. Where something was refused, the line of the verdict has
-// the reason of the first line with a cross; here it is left out again.
+// The first `lines` lines of `all`, and the status. If something was refused, the line of the
+// verdict repeats the reason of the first line with a cross. This function checks the repeated
+// reason, and removes it.
 inline Lines WithoutReason(size_t lines, Lines all) {
   const auto is_cross = [](const std::string& line) { return line.rfind("  ✗ ", 0) == 0; };
   const auto cross = std::find_if(all.begin(), all.end(), is_cross);
@@ -47,10 +48,10 @@ inline Lines WithoutReason(size_t lines, Lines all) {
   return all;
 }
 
-// A copy of a golden package with its libraries beside it, for a test to spoil.
+// A copy of a golden package with its libraries beside it. Each test damages its copy.
 class Reason : public testing::Test {
  protected:
-  // `name` is a directory of make_golden_packages, or a package in it.
+  // `name` is a directory or a package that make_golden_packages made.
   void Take(const std::string& name) {
     const std::filesystem::path source = std::filesystem::path(GOLDEN_PACKAGES) / name;
     if (std::filesystem::is_directory(source)) {

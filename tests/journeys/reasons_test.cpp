@@ -1,5 +1,5 @@
-// Why a package is refused, in the words of the simulator. The packages are real: the developers'
-// own tools make them.
+// The reasons that the simulator gives for refused packages. The packages are real: developers'
+// tools made them.
 #include <gtest/gtest.h>
 
 #include <algorithm>
@@ -91,7 +91,7 @@ TEST_F(Reason, DsaKey) {
                             "-> 1"}));
 }
 
-// The cure tells its cost.
+// The cure also states its cost.
 TEST_F(Reason, AnotherKeyIsAnotherSignerAndRotationDoesNotHelp) {
   for (const char* name : {"apksigner-ec", "apksigner-5120"}) {
     Do("rm -rf -- *");
@@ -106,8 +106,8 @@ TEST_F(Reason, AnotherKeyIsAnotherSignerAndRotationDoesNotHelp) {
   }
 }
 
-// Every keytool signs the certificate of a key of this size with SHA-384 unless it is told
-// otherwise, and what the cure says helps.
+// By default, every version of keytool signs the certificate of a key of this size with SHA-384.
+// The package keytool-sha256 shows that the cure helps.
 TEST_F(Reason, CertificateSignedWithALongerDigest) {
   Take("keytool-sha384");
   const Lines told = Told(5);
@@ -130,7 +130,7 @@ TEST_F(Reason, SignatureOverALongerDigest) {
             "MD5, SHA-1 and SHA-256");
 }
 
-// No tool makes such a block: it is written down, without any private key, for another's key.
+// No tool makes such a block. The test writes it for another owner's key, without the private key.
 TEST_F(Reason, ExponentOfOne) {
   Take("apksigner-sha256-2048");
   Do("unzip -q base.apk META-INF/CERT.SF");
@@ -169,7 +169,7 @@ TEST_F(Reason, CutFile) {
                             "  ✗ file  not signed: it begins like an archive and has no end: it "
                             "was cut off",
                             "-> 1"}));
-  // The zip library's own words are part of the timeline.
+  // The zip library's own message is part of the timeline.
   EXPECT_EQ(Told(4)[3], "   1  log        [ziparchive] Zip: EOCD not found, " +
                             (directory_ / "base.apk") + " is not zip");
 }
@@ -182,7 +182,7 @@ TEST_F(Reason, TextFile) {
 
 TEST_F(Reason, DamagedArchive) {
   Take("apksigner-sha256-2048");
-  // Of the end record, the directory's offset.
+  // This changes the directory's offset in the end record.
   Do("printf '\\xff' | dd of=base.apk bs=1 conv=notrunc status=none "
      "seek=$(($(stat -c %s base.apk) - 3))");
   EXPECT_EQ(Told(2)[1],
@@ -323,7 +323,6 @@ TEST_F(Reason, EncryptedEntryThatTheToolReads) {
   }
 }
 
-// The installation leaves it out, and the tool cannot read it either.
 TEST_F(Reason, ArchivesThatAreNoPackage) {
   Take("apksigner-sha256-2048");
   Do("touch BundleConfig.pb; zip -q app.aab BundleConfig.pb; zip -q set.apks base.apk;"
@@ -361,7 +360,7 @@ TEST_F(Reason, KeyOf512BitsIsSignedWithAWarning) {
             told.end());
 }
 
-// The command that is told makes a certificate for the same key that the tool takes.
+// The command in the cure makes another certificate for the same key, and the tool accepts it.
 TEST_F(Reason, CertificateWithSha384IsCuredByTheCommandThatIsTold) {
   Take("keytool-sha384");
   const Lines told = Told(10);

@@ -1,5 +1,5 @@
-// Packages that were changed after they were signed, or that lack a piece: what is refused, and
-// with which reasons.
+// Packages that were changed after they were signed, or that lack a part: what the tool refuses,
+// and for which reasons.
 #include <gtest/gtest.h>
 #include <sys/stat.h>
 
@@ -15,7 +15,7 @@ namespace {
 
 const Bytes kLibrary = ToBytes("\177ELF foo");
 
-// A package that asks for the permission, and its library on disk, for a test to spoil.
+// A package that asks for the permission, and its library on disk. Each test damages one of them.
 class RefusedPackage : public testing::Test {
  protected:
   explicit RefusedPackage(const PackageOptions& options = Options())
@@ -32,15 +32,16 @@ class RefusedPackage : public testing::Test {
     return Simulate(apk_);
   }
 
-  // The package is judged bad before anything else happens: these records, and nothing signed.
+  // The package is refused before anything else happens. The tool logs these records and signs
+  // nothing.
   void ExpectRefusalAfter(std::initializer_list<std::string> reasons) const {
     const Simulation run = Run();
     EXPECT_EQ(run.timeline, Timeline({Timeline(reasons), NothingSigned(apk_), Exit(0)}));
     EXPECT_EQ(run.status, 1);
   }
 
-  // The dex file is refused for these reasons when the first step asks for the package's verdict.
-  // That the package asks for the permission is known by then, so the last step speaks up, too.
+  // The dex file is refused for these reasons when the first step checks the package. By then the
+  // tool knows that the package asks for the permission, so the last step logs an error as well.
   void ExpectDexFileRefusedAfter(std::initializer_list<std::string> reasons) const {
     const Simulation run = Run();
     EXPECT_EQ(
@@ -54,12 +55,12 @@ class RefusedPackage : public testing::Test {
     EXPECT_EQ(run.status, 1);
   }
 
-  // The library is missing, which is not a refusal; the package is signed and registered.
+  // The library is missing, which is not a refusal. The package is signed and registered.
   void ExpectLibraryAbsentAfter(std::initializer_list<std::string> reasons) const {
     ExpectGoodPackageWith(Timeline(reasons), 0);
   }
 
-  // The library is refused for these reasons; the package is signed and registered all the same.
+  // The library is refused for these reasons, but the package is signed and registered.
   void ExpectLibraryRefusedAfter(std::initializer_list<std::string> reasons) const {
     ExpectGoodPackageWith(Timeline(reasons), 1);
   }
@@ -67,7 +68,7 @@ class RefusedPackage : public testing::Test {
   // Nothing is refused: the library and the package are signed, and the key is registered.
   void ExpectAllSigned() const { ExpectGoodPackageWith(SignedLibrary(library_), 0); }
 
-  // The package is signed and registered after this happened to its library.
+  // `library` has the events of the library. After them, the package is signed and registered.
   void ExpectGoodPackageWith(const std::string& library, int status) const {
     const Simulation run = Run();
     EXPECT_EQ(run.timeline,
@@ -112,7 +113,7 @@ TEST_F(TamperedPackage, SignatureFileIsRefused) {
                       Log(6, "file not verified: META-INF/CERT.SF\n")});
 }
 
-// The block ends with the signature, which becomes another number: no padding comes out of it.
+// The signature is at the end of the block. The changed signature has no valid padding.
 TEST_F(TamperedPackage, SignatureInTheBlockIsRefused) {
   package_.Item("META-INF/CERT.RSA").data.back() ^= 1;
 
@@ -171,7 +172,7 @@ TEST_F(TamperedPackage, SecondDexFileIsNotLookedAt) {
 TEST_F(TamperedPackage, CertificateOfAnotherIssuerIsRefused) {
   package_ = MakePackage([] {
     PackageOptions options = Options();
-    // The issuer has the smaller modulus, so that its signature is a number below the other's.
+    // The issuer has the smaller modulus, so its signature is a number below the subject's modulus.
     options.block.key = "rsa-2048-other";
     options.block.issuer_key = "rsa-2048";
     return options;
@@ -221,7 +222,7 @@ TEST_F(IncompletePackage, LibraryThatIsADirectoryOnDiskIsRefused) {
                              Log(6, "VeltSignJni: File not verified: " + library_ + "\n")});
 }
 
-// Reading it would wait for somebody to write.
+// Reading the pipe would wait for a writer.
 TEST_F(IncompletePackage, LibraryThatIsAPipeOnDiskIsRefused) {
   std::filesystem::remove(library_);
   ASSERT_EQ(mkfifo(library_.c_str(), 0600), 0);
@@ -229,7 +230,7 @@ TEST_F(IncompletePackage, LibraryThatIsAPipeOnDiskIsRefused) {
                              Log(6, "VeltSignJni: File not verified: " + library_ + "\n")});
 }
 
-// In a user namespace of its own the tool has no right to another user's files, not even as root.
+// In its own user namespace, the tool has no right to another user's files, even as root.
 TEST_F(IncompletePackage, LibraryThatMayNotBeReadIsRefused) {
   if (!CanMakeNamespaces()) GTEST_SKIP() << kNoNamespaces;
   std::filesystem::permissions(library_, std::filesystem::perms::none);
@@ -272,12 +273,12 @@ TEST_F(IncompletePackage, OneRefusedLibraryDoesNotStopTheOther) {
   const std::string refused = Log(6, "Can't open file: " + missing + "\n") +
                               Log(6, "VeltSignJni: File not verified: " + missing + "\n");
   const std::string signed_one = SignedLibrary(library_);
-  // The zip library's order of entries is its own.
+  // The zip library chooses the order of the entries.
   const bool refused_first = run.timeline.find(missing) < run.timeline.find(library_);
   EXPECT_EQ(run.timeline, Timeline({LibraryStep({refused_first ? refused : signed_one,
                                                  refused_first ? signed_one : refused}),
                                     PackageStep(apk_), Exit(0)}));
-  EXPECT_EQ(run.status, 0);  // what is not there is not refused
+  EXPECT_EQ(run.status, 0);  // a missing library is not refused
 }
 
 }  // namespace

@@ -1,4 +1,4 @@
-// Who signed, in the words of the tool that people compare with, and what is doubtful about it.
+// The signer, in the words that apksigner prints, and the warnings about the signer.
 #include <gtest/gtest.h>
 
 #include <algorithm>
@@ -13,7 +13,7 @@ using Lines = std::vector<std::string>;
 
 std::string Golden(const std::string& name) { return std::string(GOLDEN_PACKAGES) + "/" + name; }
 
-// Those lines of a command's output that have one of the labels, from the label on.
+// The lines of `output` that have one of the labels, each from its label on.
 Lines Labelled(const std::string& output) {
   const Lines labels = {"certificate DN: ", "certificate SHA-256 digest: ", "key algorithm: ",
                         "key size (bits): ", "public key SHA-256 digest: "};
@@ -59,7 +59,8 @@ std::string Told(const std::string& name, const Lines& options = {}) {
   return RunProcess(command).output;
 }
 
-// RFC 5652 §5.3: by issuer and serial number, or by the certificate's subject key identifier.
+// RFC 5652 §5.3: a block names its signer by issuer and serial number, or by the subject key
+// identifier of the certificate.
 TEST(SignerIdentifier, MayBeTheCertificatesKeyIdentifier) {
   for (const char* name : {"openssl-cms-keyid", "openssl-cms-sha1"}) {
     const std::string text = Told(name);
@@ -68,7 +69,7 @@ TEST(SignerIdentifier, MayBeTheCertificatesKeyIdentifier) {
   }
 }
 
-// The line of that beginning; empty when no line has it.
+// The first line that has `part`; empty if no line has it.
 std::string LineWith(const std::string& text, const std::string& part) {
   std::istringstream lines(text);
   for (std::string line; std::getline(lines, line);) {
@@ -82,7 +83,7 @@ TEST(Schemes, AreThoseThatTheFileCarries) {
   EXPECT_EQ(LineWith(Told("jarsigner-sha256"), "schemes:"), "    schemes: v1");
 }
 
-// The kernel gets another digest of the key than the one that other programs print.
+// The digest of the key that the kernel gets differs from the one that other programs print.
 TEST(KernelsDigest, IsThatOfTheModulusAlone) {
   const ProcessResult modulus = RunProcess({"cat", Golden("apksigner-sha256-2048/digest")});
   EXPECT_EQ(LineWith(Told("apksigner-sha256-2048"), "modulus SHA-256") + "\n",
@@ -104,8 +105,8 @@ TEST(Doubtful, SeveralSigners) {
             "  ! it has more than one signer; the kernel gets the key of META-INF/CERT.SF alone");
 }
 
-// Newer phones know the package by the new key, this tool by the old one. apksigner rotates the key
-// in the newest scheme that it knows: v3, or v3.1 from version 32 on.
+// Newer phones use the package's new key, and this tool uses the old one. apksigner writes the new
+// key into the newest scheme that it knows: v3, or v3.1 from version 32 on.
 TEST(Doubtful, KeyThatWasRotated) {
   const std::string told = Told("rotated-key");
   const std::string schemes = LineWith(told, "schemes: ");

@@ -1,5 +1,5 @@
-// Packages that others take for somebody else's than the tool does: the simulator names the key
-// that the kernel got, wherever it names one, and sounds the alarm in the line of the verdict.
+// Packages for which other programs read another signer than the tool does. Wherever the simulator
+// names a key, it is the key that the kernel got. The line of the verdict contains an alarm.
 #include <gmpxx.h>
 #include <gtest/gtest.h>
 #include <openssl/mem.h>
@@ -20,14 +20,14 @@ namespace {
 
 using nlohmann::json;
 
-// SHA-256 of the modulus of the key whose owner made none of these packages.
+// The SHA-256 digest of the victim's modulus, that of the key rsa-2048.
 std::string VictimsDigest() { return Hex(DigestOf(Digest::kSha256, ModulusOf("rsa-2048"))); }
 
 // A key with the public exponent 65537, and how to sign with it.
 struct OwnKey {
   mpz_class modulus;
   mpz_class secret;  // the private exponent
-  size_t size;       // of the modulus as the tool counts it, in bytes
+  size_t size;       // the modulus's size in bytes, as the tool counts it
 
   Bytes Encoded(const mpz_class& number) const {
     const size_t used = (mpz_sizeinbase(number.get_mpz_t(), 2) + 7) / 8;
@@ -44,7 +44,7 @@ struct OwnKey {
   }
 };
 
-// The package, signed anew with this certificate and key.
+// The package, signed again with this certificate and key.
 Package SignedAgain(Package package, Certificate certificate, const OwnKey& key) {
   certificate.signature = der::BitString(key.Sign(certificate.Tbs()));
   SignatureBlock block;
@@ -55,9 +55,9 @@ Package SignedAgain(Package package, Certificate certificate, const OwnKey& key)
   return package;
 }
 
-// The certificate shows the victim's modulus. An exponent of eight bytes makes the tool read on
-// behind it for 300 bytes in all, up to such of an extension that the number is a prime: its author
-// can sign for it.
+// The certificate shows the victim's modulus. An exponent of eight bytes makes the tool read 300
+// bytes from the start of this modulus as its modulus. The last of them are bytes of an extension,
+// chosen so that the number is a prime. The author of the package can sign for a prime modulus.
 Package WithAPrimeBehindTheVictimsModulus(std::string* digest) {
   constexpr size_t kSize = 300;
   Certificate certificate;
@@ -72,13 +72,14 @@ Package WithAPrimeBehindTheVictimsModulus(std::string* digest) {
     const auto at = std::search(tbs.begin(), tbs.end(), modulus.begin(), modulus.end());
     return Bytes(at, at + kSize);
   };
-  // The last of them that is read is the byte that a change of the prime's last ones ends with.
+  // The next prime differs from this number only in the last bytes, which are bytes of the
+  // extension.
   const Bytes before = number_read();
   OwnKey key = {0, 0, kSize};
   mpz_import(key.modulus.get_mpz_t(), kSize, 1, 1, 0, 0, before.data());
   mpz_nextprime(key.modulus.get_mpz_t(), key.modulus.get_mpz_t());
   const Bytes prime = key.Encoded(key.modulus);
-  size_t kept = 0;  // of the free bytes, how many are read
+  size_t kept = 0;  // the number of free bytes that are read
   while (kept < free.size()) {
     free[kept] = 0xee;
     if (number_read() == before) break;
@@ -93,7 +94,7 @@ Package WithAPrimeBehindTheVictimsModulus(std::string* digest) {
   return SignedAgain(MakePackage(), certificate, key);
 }
 
-// Two zeros before the modulus, one of which stays in the tool's key and its digest.
+// Two zero bytes are before the modulus. One of them stays in the tool's key and in its digest.
 Package WithAZeroBeforeTheModulus(std::string* digest) {
   const RSA* const rsa = TestRsaKey("rsa-2048");
   const auto number = [](const BIGNUM* from) {
@@ -110,8 +111,8 @@ Package WithAZeroBeforeTheModulus(std::string* digest) {
   return SignedAgain(MakePackage(), certificate, key);
 }
 
-// All that is told of a package: the line of the verdict, the text, the journal's verdict, the
-// page.
+// All that the simulator reports about a package: the line of the verdict, the text, the journal's
+// verdict and the page.
 struct Told {
   explicit Told(const Package& package, const std::vector<std::string>& options = {})
       : Told(package.Build(), options) {}
@@ -193,7 +194,7 @@ TEST(TwoFaces, TwoZerosBeforeTheModulusMakeAnotherKey) {
   EXPECT_EQ(told.Warnings(), Codes({"certificate-other-key"}));
 }
 
-// An exponent of five bytes is one that others take as it is, and so they read the certificate.
+// Other programs accept an exponent of five bytes, so they read the certificate.
 TEST(TwoFaces, CertificateThatOthersReadIsComparedWithTheKernelsKey) {
   Certificate certificate;
   certificate.public_key_info =
@@ -217,7 +218,7 @@ TEST(TwoFaces, BlockThatNoStrictReaderReadsIsAmbiguous) {
   const Bytes certificate = SignatureBlock().SignerCertificate().Build();
   const auto at = std::search(block.begin(), block.end(), certificate.begin(), certificate.end());
   ASSERT_NE(at, block.end());
-  // The tag of the certificates, which the tool does not look at.
+  // This is the identifier octet of the certificates, which the tool ignores.
   at[-4] = 0xa3;
   const Told told(package);
   EXPECT_EQ(told.status, 0);
@@ -251,7 +252,7 @@ TEST(TwoFaces, PackageNameOfAnotherNamespaceIsToldBesideTheInstallers) {
   EXPECT_EQ(told.Warnings(), Codes({"other-package-name"}));
 }
 
-// ---- The newer signatures: what the platform reads counts.
+// ---- The newer signatures: the values that the platform reads count.
 
 TEST(TwoFaces, SecondValueOfASchemeIsNobodys) {
   const Bytes own = Signers({SignerBytes(SignatureBlock().SignerCertificate().Build())});

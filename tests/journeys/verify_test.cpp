@@ -25,7 +25,7 @@ ProcessResult Call(Words command, const Words& more, const std::string& director
   return RunProcess(command, directory);
 }
 
-// The answer of the phone's kernel, which these options of the simulator describe.
+// The answer of the simulated phone's kernel. `words` are options of the simulator and files.
 ProcessResult Verify(const Words& words) { return Call({SimulatorPath(), "--verify"}, words); }
 
 // The program's answer without a simulation.
@@ -39,7 +39,8 @@ void ExpectAnswer(const ProcessResult& run, int status, const std::string& outpu
   EXPECT_EQ(run.status, status);
 }
 
-// A good package with a library beside it, and a phone that remembers what the tool had signed.
+// A good package with a library beside it, and a phone that remembers the files that its kernel
+// signed.
 class SignedPackage : public testing::Test {
  protected:
   SignedPackage() {
@@ -73,7 +74,7 @@ TEST_F(SignedPackage, IsNoLongerTrustedWhenAByteChanges) {
                apk_ + ": trusted\n" + library_ + ": not trusted (errno 126, ENOKEY)\n");
 }
 
-// The phone that signed it is another one.
+// Another phone signed the package.
 TEST_F(SignedPackage, IsNotTrustedByAnotherPhone) {
   ExpectAnswer(Verify({apk_}), 1, apk_ + ": not trusted (errno 126, ENOKEY)\n");
 }
@@ -87,7 +88,8 @@ TEST(Verify, KernelGivesTheReason) {
                file + ": trusted\n");
 }
 
-// Asked once, and for nothing else: neither is the integrity value read nor anything signed.
+// The kernel is asked once per file. The program does not read the integrity value, and signs
+// nothing.
 TEST(Verify, AsksForEachFileOnce) {
   const TempDir directory;
   const std::string file = directory.Write("file", {});
@@ -143,12 +145,12 @@ TEST(Verify, SocketCannotBeOpened) {
   close(fd);
 }
 
-// Its holder would be waited for.
+// A blocking open would wait for the holder of the lease.
 TEST(Verify, FileThatIsLeasedCannotBeOpened) {
   const TempDir directory;
   const std::string path = directory.Write("file", {});
   const int fd = open(path.c_str(), O_RDWR | O_CLOEXEC);
-  signal(SIGIO, SIG_IGN);  // how the holder is told
+  signal(SIGIO, SIG_IGN);  // the kernel's signal to the holder
   if (fcntl(fd, F_SETLEASE, F_WRLCK) != 0) GTEST_SKIP() << "the file system has no leases";
   ExpectAnswer(VerifyHere({path}), 1, path + ": cannot be opened (errno 11, EAGAIN)\n");
   close(fd);
@@ -172,7 +174,7 @@ TEST(Verify, EachFileHasOneLineWhateverItsName) {
                "gr\xc3\xbcn \xff: not trusted (errno 22, EINVAL)\n");
 }
 
-// EINVAL is what a kernel answers to a command of fcntl that it does not know.
+// A kernel refuses an unknown fcntl command with EINVAL.
 TEST(Verify, WithoutTheFeatureNothingIsTrusted) {
   const TempDir directory;
   const std::string file = directory.Write("file", {});
@@ -194,7 +196,7 @@ TEST(VerifyUsage, IsShownWithoutAFileAndForWhatLooksLikeAnOption) {
             "./-x: not trusted (errno 22, EINVAL)\n");
 }
 
-// "All are trusted" has to reach somebody.
+// If the answer cannot be written, the status must not be 0.
 TEST(VerifyOutput, ThatCannotBeWrittenIsAFailure) {
   const TempDir directory;
   const std::string file = directory.Write("file", {});

@@ -1,4 +1,4 @@
-// With which status apktoolkit-sim ends, and what it says then.
+// The exit status of apktoolkit-sim, and the messages that belong to it.
 #include <gtest/gtest.h>
 #include <sys/stat.h>
 #include <unistd.h>
@@ -58,7 +58,7 @@ TEST(ExitStatus, FourWhenStandardInputIsClosed) {
   EXPECT_NE(result.output.find("standard input is closed"), std::string::npos) << result.output;
 }
 
-// Not even when it is asked to.
+// The probe ignores SIGTERM (15), so the simulator must kill it.
 TEST(ExitStatus, ThreeWhenTheToolDoesNotEnd) {
   const Probe probe({"sign 3 0100ab", "ignore 15", "sleep 60"});
   const auto start = std::chrono::steady_clock::now();
@@ -82,7 +82,8 @@ TEST(ExitStatus, ThreeWhenTheVerifierDoesNotEnd) {
   EXPECT_EQ(result.status, 3);
 }
 
-// Reading a pipe waits for a writer, and a device has no end. Neither is read to remember it.
+// Reading a pipe waits for a writer, and a device has no end. With --state, the simulator reads
+// neither of them.
 TEST(ExitStatus, OneForADeviceOrAPipe) {
   const TempDir directory;
   const std::string pipe = directory / "pipe";
@@ -145,7 +146,7 @@ TEST(ExitStatus, ThreeWhenTheToolIsNoProgram) {
 TEST(ExitStatus, ThreeWhenTheStandInsAreNotInTheTool) {
   if (AreProgramsEmulated()) GTEST_SKIP() << "the emulator hides that a program does not start";
   const TempDir directory;
-  // The settings for the loader are lost on the way.
+  // This tool is started without the settings for the loader.
   const std::string tool =
       directory.Write("tool", ToBytes("#!/usr/bin/env -S -u LD_PRELOAD true\n"));
   ASSERT_EQ(chmod(tool.c_str(), 0755), 0);
@@ -191,7 +192,7 @@ TEST(ExitStatus, ThreeWhenThePageCannotBeWritten) {
             "apktoolkit-sim: cannot write the page /dev/full: No space left on device\n");
 }
 
-// Nobody reads the pipe; with a reader, one that comes a little late, all is well.
+// The run fails if nobody reads the pipe. A reader that opens the pipe a little late is enough.
 TEST(ExitStatus, ThreeWhenThePageIsAPipeThatNobodyReads) {
   const Probe probe({"sign 3 0100ab"});
   const std::string pipe = probe.directory() / "page";
@@ -206,7 +207,7 @@ TEST(ExitStatus, ThreeWhenThePageIsAPipeThatNobodyReads) {
   EXPECT_EQ(read.output.substr(read.output.size() - 8), "</html>\n");
 }
 
-// The fault lies in the file system and not in the package, so the run says nothing about the
+// The fault is in the file system and not in the package, so the run reports nothing about the
 // package.
 TEST(ExitStatus, ThreeWhenLibrariesCannotBeWritten) {
   const TempDir directory;
@@ -274,7 +275,8 @@ TEST(ExitStatus, TwoWhenThePageWouldReplaceAFile) {
 TEST(ExitStatus, TwoWhenATrustedFileOrTheToolWouldBeReplaced) {
   const TempDir directory;
   const Probe probe({"sign 3 0000"});
-  // Each begins as the output does, so that nothing but its use speaks for it.
+  // Each file begins like the output that would replace it. It is protected only because the run
+  // uses it.
   const std::string journal = directory.Write("journal", ToBytes("{\"event\":\"journal\"}\n"));
   const std::string page =
       directory.Write("page", ToBytes("<!DOCTYPE html>\n<!-- A page of apktoolkit-sim -->\n"));
@@ -337,7 +339,7 @@ TEST(ExitStatus, TwoWhenTwoOutputsAreOneFile) {
   }
 }
 
-// Both would write over each other. A pipe is no file, and takes both in turn.
+// In one file, the two outputs would overwrite each other. A pipe accepts both in turn.
 TEST(ExitStatus, TwoWhenAnOutputIsAlsoStandardOutput) {
   const Probe probe({"sign 3 0000"});
   const auto told = [&probe](const std::string& rest) {
@@ -354,7 +356,7 @@ TEST(ExitStatus, TwoWhenAnOutputIsAlsoStandardOutput) {
   EXPECT_EQ(told("--journal /dev/stdout | cat").status, 0);
 }
 
-// One output cannot be opened: the others must not look like those of a good run.
+// If one output cannot be opened, the others must not look like those of a good run.
 TEST(ExitStatus, ThreeInEachReportWhenOneOutputCannotBeOpened) {
   const Probe probe({"sign 3 0000"});
   const std::string directory = probe.directory().path();
@@ -374,7 +376,7 @@ TEST(ExitStatus, ThreeInEachReportWhenOneOutputCannotBeOpened) {
   EXPECT_EQ(ContentOf(journal), "{\"event\":\"journal\",\"version\":1}\n");
 }
 
-// One message for each output, and the SARIF log says that the run failed.
+// There is one message per output, and the SARIF log says that the run failed.
 TEST(ExitStatus, ThreeOnceWhenTheDiskIsFull) {
   const Probe probe({"sign 3 0000"});
   const std::string sarif = probe.directory() / "s.sarif";

@@ -1,4 +1,4 @@
-// How apktoolkit-sim ends when a signal, or the reader of its output, ends it.
+// How apktoolkit-sim ends after a signal, or after the reader of its output has ended.
 #include <gtest/gtest.h>
 #include <sys/stat.h>
 #include <unistd.h>
@@ -12,9 +12,10 @@
 
 namespace {
 
-// Runs a command in a process group of its own. As soon as a file that `pattern` names has
-// something in it, sends `signal` to the command, or to the whole group, as the keyboard does.
-// Gives the signal by which the command ended (0 if by none) and the seconds that this took.
+// Runs a command in its own process group. As soon as a file that matches `pattern` is not empty,
+// sends `signal` to the command, or to the whole group as the keyboard does. `ended_by` is the
+// signal that ended the command (0 or less if none did), and `seconds` the time from the signal to
+// the end.
 struct Interrupted {
   enum class Target { kCommand, kGroup };
 
@@ -67,7 +68,7 @@ TEST(Interruption, EndsTheToolAndTheSimulatorByTheSignal) {
   }
 }
 
-// The keyboard signals the tool as well. Its end is not the file's fault.
+// The keyboard signals the tool as well. The tool then ends, but not because of the file.
 TEST(Interruption, OfTheWholeProcessGroupIsNoRefusal) {
   const Probe slow({"sign 3 0000", "pid", "sleep 60"});
   const std::string sarif = slow.directory() / "log.sarif";
@@ -123,7 +124,7 @@ TEST(Interruption, ByAReaderThatEndsLeavesNothingBehind) {
   EXPECT_TRUE(std::filesystem::is_empty(temporary.path()));
 }
 
-// As of what nohup starts.
+// For example, nohup starts programs that ignore SIGHUP.
 TEST(Interruption, IsNoneByASignalThatTheCallerIgnores) {
   const Probe slow({"sign 3 0000", "pid", "sleep 1"});
   const ProcessResult result = RunProcess(
@@ -151,7 +152,8 @@ TEST(Page, OfAnInterruptedRunHasWhatWasDone) {
   EXPECT_NE(text.find("</html>\n"), std::string::npos);
 }
 
-// Each file has its case and its error, and the last two were never begun.
+// Each file has its test case. The interrupted file has an error, and so have the last two, which
+// were never begun.
 TEST(Reports, OfAnInterruptedRunAreWholeAndNotGreen) {
   const Probe good({"sign 3 0000"});
   const Probe slow({"sign 3 0000", "pid", "sleep 60"});

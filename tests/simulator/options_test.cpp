@@ -13,7 +13,7 @@ using namespace simulator;
 
 namespace {
 
-// The options after this command line, which must be a valid one.
+// The options that this command line sets. The command line must be valid.
 Options Parsed(Lines words) {
   Options options;
   words.insert(words.begin(), "apktoolkit-sim");

@@ -1,4 +1,4 @@
-// Running apktoolkit-sim with the probe as the tool.
+// Runs apktoolkit-sim with the probe as the tool.
 #pragma once
 
 #include <algorithm>
@@ -7,8 +7,7 @@
 #include "support/process.h"
 #include "support/simulation.h"
 
-// Runs apktoolkit-sim, without an installer and with packages left as they lie, for somebody who
-// reads UTF-8.
+// Runs apktoolkit-sim in a UTF-8 locale, without an installer and without laying out packages.
 inline ProcessResult Told(const Lines& words) {
   Lines command = {"env", "LC_ALL=C.UTF-8", SimulatorPath(), "--installer=off", "--install=no"};
   command.insert(command.end(), words.begin(), words.end());

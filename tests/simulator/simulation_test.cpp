@@ -10,7 +10,7 @@
 
 namespace {
 
-// The text behind such a JAR in the line of the verdict.
+// The text after the name of an untrusted JAR, in the line of the verdict.
 constexpr char kNotTrusted[] =
     "   it is a plain JAR, and those are signed only when the kernel trusts them already (ENOKEY: "
     "Required key not available)";
@@ -35,7 +35,7 @@ TEST(Files, AreVerdictsAloneWhenAsked) {
       "TRUSTED JAR  " + good.path() + "\nNOT TRUSTED JAR  " + bad.path() + kNotTrusted + "\n");
 }
 
-// The first takes longest; what is told keeps the order of the command line.
+// The first file takes longest, but the output keeps the order of the command line.
 TEST(Files, KeepTheirOrderWhenSeveralRunAtATime) {
   const Probe slow({"sign 3 0000", "sleep 1"});
   const Probe quick({"verify 3"});
@@ -60,13 +60,13 @@ TEST(Files, KeepTheirOrderWhenSeveralRunAtATime) {
   EXPECT_EQ(started, files);
 }
 
-// A pipe gets no line that would be overwritten.
+// A progress line is overwritten later, so a pipe gets none.
 TEST(Files, ShowNoProgressWithoutATerminal) {
   const Probe slow({"sign 3 0000", "sleep 2"});
   EXPECT_EQ(Simulated({slow.path()}).errors, "");
 }
 
-// util-linux's script gives it a terminal.
+// The program "script" of util-linux gives the simulator a terminal.
 TEST(Files, ShowProgressOnATerminalWhenItTakesLonger) {
   if (RunProcess({"script", "-qec", "true", "/dev/null"}).status != 0) {
     GTEST_SKIP() << "there are no pseudo-terminals here: /dev/pts is not mounted";
@@ -77,7 +77,7 @@ TEST(Files, ShowProgressOnATerminalWhenItTakesLonger) {
        "/dev/null"});
   const size_t progress = result.output.find("0 of 1 done; " + slow.path() + ": 1 s");
   EXPECT_NE(progress, std::string::npos) << result.output;
-  // It is gone before the verdict comes.
+  // The progress line is erased before the verdict is printed.
   const size_t verdict = result.output.find("\r\x1b[K\x1b[32mTRUSTED JAR", progress);
   EXPECT_NE(verdict, std::string::npos) << result.output;
 }
@@ -161,7 +161,7 @@ TEST(Page, IsWrittenAnewForAllFilesInTheirOrder) {
   EXPECT_TRUE(first < second && second < third && third != std::string::npos) << text;
 }
 
-// A journal does not deceive a person who looks at it.
+// The text of a journal must not mislead a person who looks at it.
 TEST(Journal, HasNoHiddenCharacters) {
   const TempDir directory;
   const std::string odd = directory.Write("\u0085\u202e\u200b", ToBytes("sign 3 0000\n"));
@@ -222,7 +222,7 @@ TEST(Simulation, WorksFromADirectoryThatTheLoaderCannotName) {
                    "  + key  registered for name"}));
 }
 
-// A runner that does something to the file first.
+// A runner that first executes the shell command `does`.
 std::string RunnerThat(const std::string& does, const TempDir& directory) {
   const std::string runner =
       directory.Write("runner", ToBytes("#!/bin/sh\n" + does + "\nshift\nexec env \"$@\"\n"));
@@ -258,7 +258,7 @@ TEST(Simulation, RunsOverOneFileAtTheSameTimeDoNotDisturbEachOther) {
   EXPECT_EQ(result.output.find("NOT SIMULATED"), std::string::npos);
 }
 
-// The directory is mapped by the tool and by the simulator, and is cut off again and again.
+// The tool and the simulator map the central directory, and the test cuts it off again and again.
 TEST(Simulation, SurvivesAFileThatShrinksAndGoesOnToTheNext) {
   PackageOptions options;
   for (int i = 0; i < 20000; ++i) options.entries.push_back({"assets/" + std::to_string(i), {}});
@@ -266,7 +266,7 @@ TEST(Simulation, SurvivesAFileThatShrinksAndGoesOnToTheNext) {
   MakePackage(options).WriteTo(directory / "whole.apk");
   MakePackage().WriteTo(directory / "good.apk");
   const std::string script =
-      // AddressSanitizer takes the signal for an error of the tool's.
+      // AddressSanitizer would report the signal as an error of the tool.
       "export ASAN_OPTIONS=\"$ASAN_OPTIONS:handle_sigbus=0\"\n"
       "cd \"$1\"; sim=$2; cp whole.apk base.apk\n"
       "(while [ ! -e end ]; do truncate -s 3000 base.apk; cp whole.apk base.apk; done) & loop=$!\n"
@@ -282,7 +282,7 @@ TEST(Simulation, SurvivesAFileThatShrinksAndGoesOnToTheNext) {
 TEST(Simulation, RunnerGetsThePreloadForTheTool) {
   if (AreProgramsEmulated()) GTEST_SKIP() << "there is a runner already";
   const Probe probe({"sign 3 0000"});
-  // Does what an emulator does with -E, and tells what it was given itself.
+  // The runner handles -E as an emulator does, and prints its own arguments and LD_PRELOAD.
   const std::string runner =
       probe.directory().Write("runner", ToBytes("#!/bin/sh\n"
                                                 "echo \"$1 $2 ${3%%=*} preload=$LD_PRELOAD\" >&2\n"
@@ -311,7 +311,7 @@ TEST(State, WhatWasSignedStaysTrustedWhileItsBytesStayTheSame) {
   const Probe jar({"verify 3", "sign 3 0000"});
   EXPECT_EQ(jar.Run({"--state", state.path()}).status, 1);
   EXPECT_EQ(jar.Run({"--state", state.path()}).status, 0);
-  // One byte changed.
+  // One byte of the file changed.
   jar.directory().Write("script", ToBytes("verify 3\nsign 3 0001\n"));
   EXPECT_EQ(jar.Run({"--state", state.path()}).results[0], "-1 126");
 }
@@ -332,7 +332,7 @@ TEST(State, LastsForTheFilesOfOneRunWithoutADirectory) {
   EXPECT_EQ(verified[1]["result"], 0);
 }
 
-// The last runs begin when the first have ended.
+// The last runs begin after the first ones have ended.
 TEST(State, IsNotSharedWhenSeveralFilesRunAtATime) {
   const Probe jar({"verify 3", "sign 3 0000"});
   const ProcessResult result = Simulated(

@@ -1,7 +1,8 @@
-// Builds X.509 certificates (RFC 5280 §4.1), good ones and every kind of bad one.
+// Builds X.509 certificates (RFC 5280 §4.1), good ones and every kind of malformed one.
 //
-// Each field holds the DER for its place, header included. A test changes a certificate by
-// assigning to a field. If a field is left unset, Build makes it from the keys and the digest.
+// Each field has the DER for its place, including the identifier and length octets. A test changes
+// a certificate by assigning to a field. If a field is left unset, Build makes it from the keys and
+// the digest.
 #pragma once
 
 #include <optional>
@@ -20,8 +21,8 @@ Bytes DigestOf(Digest digest, const Bytes& data);
 // The PKCS#1 v1.5 signature by the RSA test key `key` (support/keys.h) over `data`; for an EC key,
 // the ECDSA signature.
 Bytes SignWith(const std::string& key, Digest digest, const Bytes& data);
-// The encoded message of the data (RFC 8017 §9.2) in `size` bytes. The padding fills the room that
-// is left and may be empty. Empty if the DigestInfo does not fit.
+// The encoded message of the data (RFC 8017 §9.2) in `size` bytes. The padding fills the remaining
+// bytes and may be empty. Empty if the DigestInfo does not fit.
 Bytes EncodedMessage(Digest digest, const Bytes& data, size_t size);
 // An AlgorithmIdentifier with NULL or the given parameters.
 Bytes AlgorithmIdentifier(const std::string& oid, const Bytes& parameters = der::Null());

@@ -8,8 +8,8 @@
 
 #include "support/der.h"
 
-// One attribute of an element. Names and texts are UTF-8 and may hold NUL. Three bytes may encode
-// an unpaired surrogate: U+D800 is ED A0 80.
+// One attribute of an element. Names and texts are UTF-8 and may contain NUL. Three bytes may
+// encode an unpaired surrogate: U+D800 is ED A0 80.
 struct XmlAttribute {
   std::string name;
   uint8_t type;            // of the typed value (Res_value)
@@ -42,7 +42,8 @@ class CompiledXml {
   CompiledXml& End(const std::string& name);
   // A start and an end tag.
   CompiledXml& Element(const std::string& name, const std::vector<XmlAttribute>& attributes = {});
-  // A start tag that claims `count` attributes of size 0. All of them lie where this one does.
+  // A start tag that claims `count` attributes of size 0. All of them are at the offset of
+  // `attribute`.
   CompiledXml& StartWithSizelessAttributes(const std::string& name, const XmlAttribute& attribute,
                                            uint16_t count);
   CompiledXml& Text(const std::string& text);

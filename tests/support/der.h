@@ -1,4 +1,4 @@
-// Writes DER (X.690), for the builders and for tests that need an element which no builder makes.
+// Writes DER (X.690), for the builders and for tests that need an element that no builder makes.
 // Nothing is checked: a test may nest and label elements wrongly.
 #pragma once
 

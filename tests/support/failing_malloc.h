@@ -1,7 +1,8 @@
 // Makes chosen allocations fail, and checks memory that is freed.
 //
 // A test program linked with -Wl,--wrap=malloc,--wrap=free sends the calls of its own objects here,
-// and on to the real functions. The platform's libraries and the sanitizers keep theirs.
+// and this file calls the real functions. The platform's libraries and the sanitizers call the real
+// functions directly.
 #pragma once
 
 #include <cstddef>
@@ -22,7 +23,7 @@ class FailingMalloc {
   bool failed() const { return failing_call_ != 0 && calls_ >= failing_call_; }
   // The blocks that were returned and not yet freed.
   int live() const;
-  // The blocks that were freed; and those that held bytes other than zeros at that time.
+  // The blocks that were freed, and those of them that had bytes other than zero at that time.
   int freed() const { return freed_; }
   int freed_unwiped() const { return freed_unwiped_; }
 

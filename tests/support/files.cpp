@@ -19,7 +19,7 @@ namespace {
   abort();
 }
 
-// The directory that the environment names, a workstation's, or a phone's.
+// The directory for temporary files: TMPDIR, or else that of a workstation or of a phone.
 std::string TemporaryDirectory() {
   if (const char* const named = getenv("TMPDIR"); named != nullptr) return named;
   return access("/tmp", W_OK) == 0 ? "/tmp" : "/data/local/tmp";

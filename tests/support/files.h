@@ -1,4 +1,4 @@
-// Directories and files of a test's own, on disk and in memory. They are removed when the test is
+// Directories and files for one test, on disk and in memory. They are removed when the test is
 // over. If one cannot be made, the program aborts.
 #pragma once
 

@@ -12,7 +12,8 @@
 namespace {
 
 // On a phone, the keys are beside the program. A suite that separates programs by processor has
-// them one directory above. (Not found by readlink: tests have the linker wrap it.)
+// them one directory above. (This function does not call readlink, because the linker wraps
+// readlink in some tests.)
 std::string KeysDirectory() {
   const std::string keys = TEST_KEYS_DIR;
   if (keys[0] == '/') return keys;

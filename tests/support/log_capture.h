@@ -1,8 +1,8 @@
 // Catches the Android log of the code under test.
 //
 // The test program defines __android_log_print itself, so that the records of the tool, and of the
-// platform libraries under it, come here and not to standard error. A LogCapture keeps the records
-// with the tool's tag, in order, while it lives.
+// platform libraries under it, come here and do not go to standard error. A LogCapture keeps the
+// records with the tool's tag, in order, while it lives.
 #pragma once
 
 #include <string>

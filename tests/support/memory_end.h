@@ -1,5 +1,5 @@
-// Memory that ends where a block ends, for readers that no sanitizer sees: reading on crashes any
-// code.
+// Memory that ends where a block ends, for readers that no sanitizer checks. A read after the end
+// crashes any code.
 //
 // A program that links this file (target `memory_end`) has its operator new replaced.
 #pragma once

@@ -1,11 +1,11 @@
-// Runs a command with another file system or other rights than the test's own.
+// Runs a command with another file system or with other rights than those of the test.
 #pragma once
 
 #include <string>
 #include <vector>
 
-// True if this kernel, and the container that this may run in, allow that. Otherwise a test that
-// needs it is skipped, with this reason.
+// True if this kernel, and the container that this may run in, allow namespaces. Otherwise a test
+// that needs them is skipped with the reason kNoNamespaces.
 bool CanMakeNamespaces();
 inline constexpr char kNoNamespaces[] = "the kernel, or this container, allows no user namespaces";
 

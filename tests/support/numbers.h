@@ -1,4 +1,5 @@
-// The integers' operands: made of limbs, drawn at random, and converted to GMP's numbers.
+// Operands for the tests of the integers: made of limbs, drawn at random, and converted to GMP's
+// numbers.
 #pragma once
 
 #include <gmpxx.h>

@@ -26,7 +26,7 @@ struct PackageOptions {
   // Replaces the compiled manifest of the two fields above. Empty bytes leave the entry out (a
   // JAR).
   std::optional<Bytes> android_manifest;
-  // The entries beside the Android manifest, in the order of the archive.
+  // The entries other than the Android manifest, in the order of the archive.
   std::vector<ZipItem> entries = {{"classes.dex", ToBytes("dex\n035")},
                                   {"lib/arm64-v8a/libfoo.so", ToBytes("\177ELF foo")}};
 
@@ -62,7 +62,7 @@ Package MakePackage(const PackageOptions& options = {});
 
 // Options for a plain JAR: everything but the Android manifest.
 PackageOptions PlainJar();
-// Options for a package with these entries beside the Android manifest and a dex file.
+// Options for a package with these entries, the Android manifest and a dex file.
 PackageOptions WithLibraries(const std::vector<ZipItem>& libraries);
 // Options for a good package with a native library and no dex file.
 PackageOptions WithoutDex();

@@ -19,7 +19,8 @@ make_unsigned_package() {
   rm -r "$work"
 }
 
-# put_android_manifest APK MANIFEST: makes the package anew, with only this manifest, compiled.
+# put_android_manifest APK MANIFEST: makes the package again, with only this manifest, in compiled
+# form.
 put_android_manifest() {
   aapt package -f -M "$2" -F "$1" -I /usr/share/android-framework-res/framework-res.apk
 }

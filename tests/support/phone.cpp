@@ -91,7 +91,7 @@ ssize_t __wrap___read_chk(int fd, void* buffer, size_t size, size_t /*room*/) {
 }
 
 // Calls of open become calls of __open_2 in a build with _FORTIFY_SOURCE. Every platform tree is
-// built so.
+// built with it.
 int __wrap___open_2(const char* path, int flags) { return __wrap_open(path, flags); }
 
 FILE* __wrap_fopen(const char* path, const char* mode) {

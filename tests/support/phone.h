@@ -3,8 +3,8 @@
 //
 // A program that links this file must have the linker wrap open, read, fcntl, fopen, usleep,
 // fgetxattr and readlink, and the checked forms of open, read and readlink (target `phone` does
-// that). It then has a Phone to set up and to read afterwards. While no Phone lives, every wrapped
-// call goes to the real system, and libzu refuses.
+// that). Its tests then set up a Phone, and read the results from it. While no Phone lives, every
+// wrapped call goes to the real system, and libzu refuses.
 #pragma once
 
 #include <cstdint>
@@ -20,8 +20,8 @@ struct Phone {
   Phone(const Phone&) = delete;
   Phone& operator=(const Phone&) = delete;
 
-  // A healthy phone; the test changes it. The texts of the integrity file, one for each opening.
-  // The last text repeats. kNoFile means that this opening fails.
+  // The defaults are a healthy phone, and a test changes them. The texts of the integrity file, one
+  // for each opening. The last text repeats. kNoFile means that this opening fails.
   std::deque<std::string> integrity = {"1f\n"};
   static constexpr char kNoFile[] = "no file";
   int sign_errno = 0;             // 0: the kernel signs
@@ -49,7 +49,7 @@ struct Phone {
   // The actions of the code under test, in order: "integrity PATH", "sleep MICROSECONDS", "sign FD
   // PAYLOAD-HEX", "verify FD", "register FD NAME DATA-HEX".
   std::vector<std::string> events;
-  // The number of other files than an integrity file that fopen opened.
+  // The number of files that fopen opened, not counting integrity files.
   int other_fopens = 0;
   // The attributes that were read: "FD NAME VALUE-IS-NULL SIZE".
   std::vector<std::string> attributes;

@@ -17,7 +17,7 @@ bool Redirect(int number, const std::string& path, int flags) {
   return fd >= 0 && dup2(fd, number) == number && close(fd) == 0;
 }
 
-// In the child: becomes the command, or exits with 127 as a shell does.
+// In the child process: executes the command, or exits with 127 as a shell does.
 [[noreturn]] void Become(const std::vector<std::string>& command, const std::string& directory,
                          const std::string& output, const std::string& errors) {
   std::vector<char*> arguments;

@@ -32,7 +32,7 @@ inline mpz_class ToNumber(const Bytes& bytes) {
   return number;
 }
 
-// One of the fixed keys. libcrypto holds its private half.
+// One of the fixed keys. libcrypto has its private half.
 struct FixedKey {
   explicit FixedKey(const std::string& name)
       : rsa(TestRsaKey(name)),

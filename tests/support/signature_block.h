@@ -1,8 +1,8 @@
 // Builds the signature block of a signed JAR: a PKCS#7 SignedData (RFC 2315 §9) without content,
 // with one signer.
 //
-// The defaults make a good block. Each field changes one part of it. Optional fields hold DER that
-// replaces the part that would be made.
+// The defaults make a good block. Each field changes one part of it. An optional field has DER,
+// which replaces the part that Build would make.
 #pragma once
 
 #include <optional>
@@ -19,7 +19,7 @@ struct SignatureBlock {
   std::string issuer_key;
   // The serial number that names the signer; unset: its certificate's.
   std::optional<Bytes> serial;
-  // The signature covers authenticated attributes, which hold the digest of the signature file.
+  // The signature covers authenticated attributes, which contain the digest of the signature file.
   bool authenticated_attributes = false;
   // The signature covers other bytes than the signature file.
   bool wrong_digest = false;

@@ -52,7 +52,7 @@ ArchiveParts TakeApart(const Bytes& archive) {
   return parts;
 }
 
-// The digest of the digests of each megabyte of the three parts.
+// The digest over the digests of all chunks of 1 MiB of the three parts.
 Bytes DigestOfChunks(const ArchiveParts& parts) {
   constexpr size_t kChunk = 1 << 20;
   Bytes digests;

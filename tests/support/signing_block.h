@@ -1,7 +1,7 @@
 // Writes, layer by layer, the block of the schemes after JAR signing (APK Signature Scheme v2, v3,
-// v3.1). It lies between an archive's entries and its central directory. To it, META-INF is an
-// entry like others. Numbers are little-endian. Every list and element has its length as 32 bits
-// before it.
+// v3.1). It is between an archive's entries and its central directory. It protects the entries of
+// META-INF like all other entries. Numbers are little-endian. Every list and element has its length
+// as 32 bits before it.
 #pragma once
 
 #include <cstdint>

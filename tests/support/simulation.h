@@ -9,10 +9,10 @@ struct Simulation {
   std::string timeline;  // see expected_timeline.h
 };
 
-// Runs the tool on `file` in the simulated phone that `options` describe. Here and below no phone's
-// installer is asked and no library is laid out, unless an option says so: most tests are for the
-// tool's own answers about the files as they lie there. The test fails if the simulation itself
-// fails or writes anything to standard error.
+// Runs the tool on `file` in the simulated phone that `options` describe. Here and below, no
+// phone's installer is asked and no library is laid out, unless an option says so. Most tests check
+// the tool's own answers about files in the places where the test put them. The test fails if the
+// simulation itself fails or writes anything to standard error.
 Simulation Simulate(const std::string& file, const std::vector<std::string>& options = {});
 
 // The same with more control: the whole command before the simulator's options, and the directory.

@@ -12,7 +12,7 @@ constexpr uint16_t kVersion = 20;
 constexpr uint16_t kDescriptorFlag = 1 << 3;
 constexpr uint16_t kStored = 0, kDeflated = 8;
 
-// The true facts of an item's data.
+// The true values for an item's data.
 struct Facts {
   Bytes contents;
   uint32_t crc;

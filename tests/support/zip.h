@@ -1,7 +1,7 @@
-// Writes zip archives, good ones and every kind of lying one.
+// Writes ZIP archives, good ones and all kinds with false fields.
 //
-// The archive tells the truth about every field that an item leaves unset. A set field is written
-// as it is, in the one place that it names, and changes nothing else.
+// Every field that an item leaves unset gets its true value. A field that is set is written
+// unchanged, only in the place that it names.
 #pragma once
 
 #include <cstdint>
@@ -11,7 +11,7 @@
 
 #include "support/der.h"
 
-// The claims of one of the three places about an entry's data.
+// The values that one of the three places states about an entry's data.
 struct ZipClaim {
   std::optional<uint32_t> crc;
   std::optional<uint32_t> compressed_length;

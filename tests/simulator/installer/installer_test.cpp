@@ -1,4 +1,4 @@
-// The process that is asked, with programs of the test's own in the place of java.
+// The installer's process. The tests put programs of their own in the place of java.
 #include "simulator/installer/installer.h"
 
 #include <gtest/gtest.h>
@@ -15,7 +15,7 @@ using namespace simulator;
 
 namespace {
 
-// A script that is called java, first on the path, for as long as this lives.
+// While it lives, `script` is the first program named java on PATH.
 class FakeJava {
  public:
   explicit FakeJava(const std::string& script) : path_(getenv("PATH")) {
@@ -39,7 +39,7 @@ constexpr char kRefusal[] =
 InstallerOptions Patient(double seconds) {
   InstallerOptions options;
   options.timeout = seconds;
-  options.program = "/proc/self/exe";  // nobody runs it
+  options.program = "/proc/self/exe";  // it is never run
   return options;
 }
 
@@ -56,7 +56,7 @@ TEST(InstallerProcess, GetsTheLevelsAndOnePathALine) {
   Installer installer(options);
   EXPECT_EQ(installer.Judge(package.path()).state, Judgement::State::kJudged);
   EXPECT_EQ(ContentOf(java / "copy"), ContentOf(package.path()));
-  // One process serves all.
+  // The same process judges all packages.
   EXPECT_EQ(installer.Judge(package.path()).state, Judgement::State::kJudged);
   EXPECT_EQ(ContentOf(java / "asked"), "28 33\n");
 }
@@ -83,7 +83,7 @@ TEST(InstallerProcess, ThatIsOffIsNotStarted) {
   EXPECT_NE(RunProcess({"test", "-e", java / "started"}).status, 0);
 }
 
-// The second package gets an answer from another process.
+// Another process answers for the second package.
 TEST(InstallerProcess, IsStartedAgainWhenItEnds) {
   const FakeJava java(
       "if [[ ! -e $0.was ]]; then touch \"$0.was\"; read -r path; exit 1; fi\n"
@@ -121,7 +121,7 @@ TEST(InstallerProcess, ThatDoesNotStopSayingIsNoAnswer) {
   EXPECT_EQ(Installer(options).Judge(package.path()).state, Judgement::State::kGaveUp);
 }
 
-// ---- What the user is told of it.
+// ---- The messages to the user.
 
 TEST(InstallerProcess, ThatGaveUpMakesNoSuccess) {
   const FakeJava java("read -r path");

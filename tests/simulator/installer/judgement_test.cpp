@@ -10,7 +10,7 @@ namespace {
 
 std::string Hexadecimal(const Bytes& bytes) { return Hex(bytes); }
 
-// One range with these members in place of good ones.
+// An answer with one range. The range has these members in place of good ones.
 std::string Answer(const std::string& verified, const std::string& signers,
                    const std::string& errors) {
   return R"({"ranges":[{"first":27,"last":2147483647,"verified":)" + verified +
@@ -81,7 +81,8 @@ TEST(Judgement, SignerWhoseCertificateIsNotReadIsNoAnswer) {
             "the crypto library does not read the certificate of the v2 signer");
 }
 
-// Otherwise a package could be installable with errors, or for nobody.
+// Without this check, a package could be installable with errors or without a signer, or refused
+// without an error.
 TEST(Judgement, AnswerThatContradictsItselfIsNone) {
   EXPECT_EQ(WhyNone(Answer("true", kSigner, kError)), "its answer is malformed");
   EXPECT_EQ(WhyNone(Answer("true", "[]", "[]")), "its answer is malformed");

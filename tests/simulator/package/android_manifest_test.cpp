@@ -29,11 +29,12 @@ std::optional<bool> Extracts(const std::vector<XmlAttribute>& attributes,
   return ParseAndroidManifest(xml.Build()).extracts_libraries;
 }
 
-// All strings of the pool are made the longest one: 40 times as long together as the document.
+// Makes every string of the pool the longest one. Together, the strings are then 40 times as long
+// as the document.
 Bytes WithStringsInOneAnother(Bytes bytes) {
-  constexpr size_t kPool = 8;          // behind the document's header
-  constexpr size_t kOffsets = 8 + 28;  // behind the pool's
-  // Which of the strings is the long one: its offset is followed by one that is 5000 more.
+  constexpr size_t kPool = 8;          // after the document's header
+  constexpr size_t kOffsets = 8 + 28;  // after the pool's header
+  // The long string is the one after which the next offset is more than 5000 bytes larger.
   const auto number = [&bytes](size_t at) {
     return bytes[at] | bytes[at + 1] << 8 | bytes[at + 2] << 16 | bytes[at + 3] << 24;
   };
@@ -69,7 +70,8 @@ TEST(AndroidManifestFacts, PackageNameInEitherEncoding) {
   }
 }
 
-// The tool takes the first attribute of the local name, the installer the one of no namespace.
+// The tool uses the first attribute with this local name. The installer uses the attribute without
+// a namespace.
 TEST(AndroidManifestFacts, PackageNameOfAnotherNamespaceIsTheToolsAlone) {
   for (const auto pool : kPools) {
     CompiledXml xml(pool);
@@ -106,7 +108,7 @@ TEST(AndroidManifestFacts, WhetherLibrariesAreExtracted) {
   }
 }
 
-// An installer takes a number for a truth value.
+// An installer reads a number as a Boolean value.
 TEST(AndroidManifestFacts, LibrariesAreExtractedForAnyNumberButZero) {
   EXPECT_EQ(Extracts({IntAttribute("extractNativeLibs", 0)}), false);
   EXPECT_EQ(Extracts({IntAttribute("extractNativeLibs", 7)}), true);

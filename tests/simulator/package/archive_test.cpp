@@ -28,7 +28,7 @@ ZipItem Damaged(const std::string& name) {
 
 ZipItem Good(const std::string& name) { return {name, ToBytes("data of " + name)}; }
 
-// "name size", and "damaged" where the entry is.
+// "name size" of each entry, with "damaged" if the entry is damaged.
 Lines EntriesOf(const Bytes& zip) {
   const MemoryFile file(zip);
   int32_t result = -1;
@@ -61,7 +61,7 @@ TEST(Archive, DamagedEntryIsNamedAndEndsNothing) {
             Lines({"a 9", "b 9 damaged", "c 9"}));
 }
 
-// The order of the walk is the library's own, so each place of the damaged entry is tried.
+// The library chooses the order of the walk, so the test tries each place of the damaged entry.
 TEST(Archive, WalkTellsWhereTheToolsEnds) {
   const Lines names = {"lib/x/a.so", "lib/x/b.so", "lib/x/c.so"};
   const Lines order = WalkOf(BuildZip({Good(names[0]), Good(names[1]), Good(names[2])})).names;
@@ -118,7 +118,7 @@ TEST(Archive, LongEntriesAreNotRead) {
   EXPECT_EQ(content.size(), Archive::kLongestRead);
 }
 
-// A length that its data cannot have is damage, however long it is.
+// If a length does not fit the data, the entry is damaged, even if the length is above the limit.
 TEST(Archive, EntryThatClaimsTooMuchIsDamaged) {
   const MemoryFile file(BuildZip(
       {ClaimingLength({"liar", Bytes(100, 'a'), true}, Archive::kLongestRead + 1), Good("a")}));
@@ -129,7 +129,8 @@ TEST(Archive, EntryThatClaimsTooMuchIsDamaged) {
   EXPECT_EQ(archive.too_long(), Lines());
 }
 
-// The directory is mapped; its pages behind the new end are gone.
+// The central directory is mapped into memory. Its pages after the new end of the file no longer
+// exist.
 TEST(Archive, SurvivesAFileThatShrinks) {
   std::vector<ZipItem> items;
   for (int i = 0; i < 2000; ++i) items.push_back({"assets/" + std::to_string(i), {}});
@@ -148,13 +149,13 @@ TEST(Archive, SurvivesAFileThatShrinks) {
     EXPECT_TRUE(archive.HasShrunk());
   }
   close(fd);
-  // The next one starts anew.
+  // The next archive does not count as shrunk.
   const MemoryFile other(BuildZip({Good("a")}));
   const Archive archive(other.fd(), &result);
   EXPECT_FALSE(archive.HasShrunk());
 }
 
-// Any other SIGBUS ends the process as it always has.
+// A SIGBUS outside a guard ends the process.
 TEST(ShrinkGuardDeathTest, GuardsItsOwnTimeAlone) {
   const auto touch = [](bool guarded) {
     const int fd = memfd_create("page", MFD_CLOEXEC);
@@ -185,14 +186,14 @@ TEST(ArchiveEnd, IsTheLastMarkThatHasRoomForARecord) {
   EXPECT_EQ(end_of(""), 1);
   EXPECT_EQ(end_of("a comment"), 1);
   EXPECT_EQ(end_of(std::string(65535, 'c')), 1);
-  // A mark in the comment does not count as the end when no record follows it.
+  // A mark in the comment does not count as the end if it does not begin a whole record.
   EXPECT_EQ(end_of(std::string("PK\5\6") + std::string(17, '\0')), 1);
-  // With one behind it the platform's library takes it for the end, and so is it taken here.
+  // A mark that begins a whole record counts as the end, as in the platform's library.
   EXPECT_EQ(end_of(std::string("PK\5\6") + std::string(18, '\0')), 0);
 }
 
-// The names in the central directory of "a" and "bcd" after `change`, which is given the bytes and
-// where the directory begins in them.
+// The names in the central directory of an archive with "a" and "bcd", after `change`. `change`
+// gets the bytes of the archive and the offset of the directory.
 Lines NamesAfter(const std::function<void(Bytes* zip, ptrdiff_t directory)>& change) {
   Bytes zip = BuildZip({Good("a"), Good("bcd")});
   const auto end = FindArchiveEnd(MemoryFile(zip).fd());
@@ -204,7 +205,8 @@ Lines NamesAfter(const std::function<void(Bytes* zip, ptrdiff_t directory)>& cha
   return names;
 }
 
-// 46 bytes, the name, and two more fields, whose lengths stand at 30 and 32 (APPNOTE.TXT 4.3.12).
+// A central directory header has 46 bytes, the name and two more fields. The lengths of these two
+// fields are at the offsets 30 and 32 (APPNOTE.TXT 4.3.12).
 TEST(ReadDirectory, PassesOverWhatStandsBehindTheNames) {
   const auto add = [](Bytes* zip, ptrdiff_t directory) {
     const Bytes more = ToBytes("extracomment");

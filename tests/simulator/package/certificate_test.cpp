@@ -16,7 +16,7 @@ std::string_view View(const Bytes& bytes) {
   return {reinterpret_cast<const char*>(bytes.data()), bytes.size()};
 }
 
-// The output of a shell command about the certificate, which it finds in the file $0.
+// The output of a shell command, in which $0 is a file with the certificate.
 std::string Told(const Bytes& certificate, const std::string& command) {
   const DiskFile file(certificate);
   const ProcessResult run = RunProcess({"bash", "-o", "pipefail", "-c", command, file.path()});
@@ -34,7 +34,7 @@ Certificate Of(const std::string& key) {
 
 }  // namespace
 
-// Each value as openssl and coreutils have it.
+// The expected values are those of openssl and coreutils.
 TEST(CertificateFacts, OfAnRsaKey) {
   const Bytes der = Of("rsa-2048").Build();
   const auto facts = ParseCertificate(View(der));
@@ -58,7 +58,8 @@ TEST(CertificateFacts, OfAnRsaKey) {
   EXPECT_TRUE(facts->is_self_issued);
 }
 
-// Before 1970 and after 2049 as well (RFC 5280 §4.1.2.5), as openssl and date have it.
+// The last second can be before 1970 or after 2049 (RFC 5280 §4.1.2.5). The expected values are
+// those of openssl and date.
 TEST(CertificateFacts, LastSecond) {
   const auto last = [](uint8_t tag, const std::string& end) {
     Certificate certificate = Of("rsa-2048");
@@ -66,7 +67,7 @@ TEST(CertificateFacts, LastSecond) {
         der::Sequence({der::Element(der::kUtcTime, "500102030405Z"), der::Element(tag, end)});
     const Bytes made = certificate.Build();
     const auto facts = ParseCertificate(View(made));
-    if (!facts) return std::string("none");  // newer libraries do not read a certificate without
+    if (!facts) return std::string("none");  // newer libraries refuse this certificate
     const std::string told = facts->not_after ? std::to_string(*facts->not_after) : "none";
     const std::string command =
         "date +%s -d \"$(openssl x509 -inform DER -in \"$0\" -noout -enddate | sed s/.*=//)\"";
@@ -124,7 +125,8 @@ TEST(CertificateFacts, CutCertificateHasNone) {
   }
 }
 
-// The certificate names its signature's algorithm twice. The one that counts is not signed itself.
+// The certificate names the algorithm of its signature twice. The name outside the signed part
+// counts.
 TEST(CertificateFacts, AlgorithmIsThatOfTheSignature) {
   Certificate certificate = Of("rsa-2048");
   certificate.tbs_algorithm = AlgorithmIdentifier(RsaSignatureOid(Digest::kSha1));
@@ -184,7 +186,7 @@ TEST(CertificateFacts, BytesBehindItDoNotCount) {
   EXPECT_EQ(ParseCertificate(View(der))->sha256, digest);
 }
 
-// As keytool, which asks the JDK's own class, writes the owner.
+// The expected texts are the owners that keytool prints. keytool uses the JDK's own class.
 TEST(NameText, IsWhatTheJdkWrites) {
   const std::vector<Bytes> names = {
       Name({{"2.5.4.6", "AB"},

@@ -22,7 +22,7 @@ namespace {
 
 PackageFacts FactsOf(const Bytes& content) { return LookAt(DiskFile(content).path()); }
 
-// The names of the entries for which this holds.
+// The names of the entries for which `holds` returns true.
 template <typename Predicate>
 std::vector<std::string> NamesWhere(const PackageFacts& facts, Predicate holds) {
   std::vector<std::string> names;
@@ -35,7 +35,7 @@ std::vector<std::string> NamesWhere(const PackageFacts& facts, Predicate holds) 
 
 }  // namespace
 
-// As sha256sum prints it: printf 'no archive\n' | sha256sum.
+// The expected digest is that of: printf 'no archive\n' | sha256sum.
 TEST(PackageFacts, HaveTheDigestOfTheFile) {
   const Bytes content = ToBytes("no archive\n");
   EXPECT_EQ(FactsOf(content).sha256,
@@ -43,7 +43,7 @@ TEST(PackageFacts, HaveTheDigestOfTheFile) {
   EXPECT_EQ(LookAt(DiskFile(content).path(), [] { return true; }).sha256, "");
 }
 
-// mknod makes a socket of it that nobody listens at.
+// mknod makes a socket at which no process listens.
 TEST(FileKind, OfWhatCannotBeOpenedIsNotTold) {
   const TempDir directory;
   const std::string socket = directory / "socket";
@@ -184,13 +184,13 @@ TEST(PackageFacts, EachListedEntryIsComparedWithItsDigest) {
   EXPECT_EQ(with(facts, EntryDigest::kNotCompared),
             std::vector<std::string>({"damaged", "unknown"}));
   EXPECT_EQ(facts.missing, std::vector<std::string>({"gone"}));
-  // Nothing is called the same that nobody had time to compare.
+  // If there was no time to compare an entry, the entry does not count as matching.
   const PackageFacts late = LookAt(file.path(), [] { return true; });
   EXPECT_EQ(with(late, EntryDigest::kMatches), std::vector<std::string>());
   EXPECT_EQ(with(late, EntryDigest::kNotCompared).size(), 5U);
 }
 
-// An entry in a directory below META-INF is an entry like others.
+// An entry in a directory below META-INF is an ordinary entry.
 TEST(PackageFacts, SignatureFilesLieInMetaInfItself) {
   Package package = MakePackage();
   for (const char* name :
@@ -217,7 +217,7 @@ TEST(PackageFacts, DamagedEntriesAreThereAllTheSame) {
   EXPECT_FALSE(facts.libraries[0].is_met);
 }
 
-// Which of them lie behind the damage is up to the library's order.
+// The order of the library decides which libraries come after the damage.
 TEST(PackageFacts, LibrariesBehindDamageAreNotMet) {
   PackageOptions options;
   for (int i = 0; i < 64; ++i) {
@@ -250,7 +250,7 @@ TEST(PackageFacts, TellWhatIsTooLongToBeLookedInto) {
   EXPECT_FALSE(facts.has_damaged_signing_block);
 }
 
-// Cut at one moment after another, until it is while the archive is read.
+// Cuts the file at different times, until one cut happens while the archive is read.
 TEST(PackageFacts, FileThatShrinksMeanwhileWasChanged) {
   PackageOptions options;
   for (int i = 0; i < 20000; ++i) options.entries.push_back({"assets/" + std::to_string(i), {}});
@@ -269,7 +269,7 @@ TEST(PackageFacts, FileThatShrinksMeanwhileWasChanged) {
   EXPECT_TRUE(was_changed);
 }
 
-// Told by opening each as the tool does: nothing is waited for.
+// Each library is opened as the tool opens it, but without waiting.
 TEST(PackageFacts, TellWhatLiesWhereTheToolLooksForALibrary) {
   const std::vector<std::string> names = {"there", "missing", "pipe", "loop", "leased"};
   PackageOptions options;

@@ -15,7 +15,7 @@ PackageFacts FactsOf(const Package& package) { return LookAt(DiskFile(package.Bu
 
 JarSignatureFacts SignatureOf(const Package& package) { return FactsOf(package).jar; }
 
-// A package whose certificate holds this RSAPublicKey.
+// A package whose certificate has this RSAPublicKey.
 Package WithKey(const Bytes& modulus, const Bytes& exponent) {
   Certificate certificate;
   certificate.public_key_info =
@@ -45,7 +45,8 @@ TEST(ToolKey, IsThatOfTheCertificate) {
   EXPECT_FALSE(jar.names_other_certificate);
 }
 
-// An exponent of eight bytes writes the modulus length: 100 in the order of the host.
+// An exponent of eight bytes overwrites the modulus length. Its last four bytes are 100 in the byte
+// order of the host.
 TEST(ToolKey, MayBeAPartOfTheModulus) {
   const JarSignatureFacts jar =
       SignatureOf(WithKey(Concat({{0}, Modulus()}), {1, 0, 1, 0, 100, 0, 0, 0}));

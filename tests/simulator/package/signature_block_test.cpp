@@ -77,7 +77,7 @@ TEST(SignatureBlockFacts, DigestsThatTheToolDoesNotReadHaveTheirNames) {
   EXPECT_EQ(digest("1.2.3.4"), "1.2.3.4");
 }
 
-// RFC 4056 §3: the signature's algorithm says it, and not the digest's.
+// RFC 4056 §3: the signature algorithm identifies RSASSA-PSS, and not the digest algorithm.
 TEST(SignatureBlockFacts, SeeRsassaPss) {
   const auto has_pss = [](const std::string& digest, const std::string& algorithm) {
     SignatureBlock block;

@@ -14,7 +14,7 @@ std::string_view View(const Bytes& bytes) {
   return {reinterpret_cast<const char*>(bytes.data()), bytes.size()};
 }
 
-// "scheme certificate" for each signer, and "damaged" where the block is.
+// "scheme certificate" for each signer, then "damaged" if the block is damaged.
 std::vector<std::string> Read(const Bytes& block) {
   const SigningBlock parsed = ParseSigningBlock(View(block));
   std::vector<std::string> lines;
@@ -42,7 +42,7 @@ TEST(SigningBlock, EachSchemeHasItsSigners) {
 
 TEST(SigningBlock, NothingIsNoBlock) { EXPECT_EQ(Read({}), Lines()); }
 
-// The platform takes the first, and does not look at another of the same scheme.
+// The platform uses the first value of a scheme, and ignores other values of the same scheme.
 TEST(SigningBlock, OfTwoValuesForASchemeTheFirstCounts) {
   const Bytes own = Signers({SignerBytes(ToBytes("OWN"))});
   const Bytes other = Signers({SignerBytes(ToBytes("OTHER"))});
@@ -70,7 +70,7 @@ TEST(SigningBlock, DamageKeepsTheSignersBeforeIt) {
   EXPECT_EQ(Read(Bytes(31, 0)), Lines({"damaged"}));
 }
 
-// A length that runs out of what it is in, at every depth.
+// At each depth, one length reaches past the end of the enclosing element.
 TEST(SigningBlock, LengthsThatReachTooFarAreDamage) {
   const Bytes whole = Signers({kSigner});
   for (size_t field : {0, 4, 8, 12, 16, 20}) {
@@ -91,7 +91,7 @@ TEST(SigningBlock, SignersBeyondReasonAreNotRead) {
 
 namespace {
 
-// The result for an archive with this in front of its central directory.
+// The result for an archive with `block` before its central directory.
 std::string ReadFrom(const Bytes& block, const std::string& comment = "",
                      bool expect_too_large = false) {
   const MemoryFile file(ArchiveWithBlock(BuildZip({{"a", ToBytes("data")}}), block, comment));
@@ -103,9 +103,9 @@ std::string ReadFrom(const Bytes& block, const std::string& comment = "",
   return read;
 }
 
-// A block of `size` bytes behind its first size field.
+// A block of `size` bytes after its first size field.
 Bytes BlockOfSize(uint64_t size) {
-  // Two sizes and the magic, the pair's own size and its number.
+  // The other bytes are the second size, the magic, and the size and the ID of the pair.
   return SigningBlockBytes({{7, Bytes(static_cast<size_t>(size) - 8 - 16 - 8 - 4, 0)}});
 }
 
@@ -131,7 +131,7 @@ TEST(ReadSigningBlock, ThereIsNoneWithoutMagicOrRoom) {
   EXPECT_EQ(ReadFrom(too_short), "");
 }
 
-// To the platform a block has the same size in front and behind.
+// The platform accepts a block only if it has the same size at its start and at its end.
 TEST(ReadSigningBlock, ThereIsNoneWhereTheTwoSizesDiffer) {
   Bytes block = SigningBlockBytes({{kSchemeV2, Signers({kSigner})}});
   ++block[0];

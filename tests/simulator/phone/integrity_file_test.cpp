@@ -42,7 +42,7 @@ TEST(IntegrityFile, MissingIsNoFile) {
                 {IntegrityEvent(0, nullptr), IntegrityEvent(0, "1f"), IntegrityEvent(0, nullptr)}));
 }
 
-// The digits and the end of the line.
+// The file has the digits and a line end.
 TEST(IntegrityFile, HoldsALine) {
   EXPECT_EQ(Probe({"bytes " + kOwn}).Run({"--integrity", "1f"}).results, Lines({"3 77"}));
 }
@@ -55,7 +55,7 @@ TEST(IntegrityFile, MayHoldWhatIsNoNumber) {
 
 TEST(IntegrityFile, MayBeEmpty) {
   const ProbeRun run = Probe({"fopen " + kOwn + " r"}).Run({"--integrity", ""});
-  EXPECT_EQ(run.results, Lines({"-2 0"}));  // the C library's errno where a scan meets the end
+  EXPECT_EQ(run.results, Lines({"-2 0"}));  // errno after fscanf met the end of the file
   EXPECT_EQ(OfKind(run.events, "integrity"), std::vector<Json>({IntegrityEvent(0, "")}));
 }
 

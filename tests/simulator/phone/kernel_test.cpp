@@ -11,7 +11,7 @@ namespace {
 
 std::string Refusal(int error) { return "-1 " + std::to_string(error); }
 
-const std::string kSuccess = "0 77";  // errno as it was
+const std::string kSuccess = "0 77";  // errno is unchanged
 
 Json SignEvent(int fd, const std::string& path, const std::string& payload, int error) {
   return {{"event", "sign"},          {"fd", fd},      {"path", path}, {"payload", payload},
@@ -123,7 +123,7 @@ TEST(KernelVerify, RefusesWithTheErrorOfThePhone) {
 }
 
 TEST(KernelFcntl, OtherCommandsGoToTheRealKernel) {
-  // The commands beside the feature's own, ones that nobody knows, and the argument.
+  // The commands next to the feature's own, an unknown command, and commands with an argument.
   const Lines commands = {"fcntl 3 1123 0",
                           "fcntl 3 1126 0",
                           "fcntl64 3 1123 0",
@@ -134,7 +134,7 @@ TEST(KernelFcntl, OtherCommandsGoToTheRealKernel) {
                           "fcntl64 3 " + std::to_string(F_DUPFD_CLOEXEC) + " 50",
                           "fcntl64 50 " + std::to_string(F_GETFD) + " 0"};
   const ProbeRun run = Probe(commands).Run();
-  // An emulator knows the commands itself, and looks at them first.
+  // An emulator checks the command before the descriptor.
   const std::string not_open = Refusal(AreProgramsEmulated() ? EINVAL : EBADF);
   EXPECT_EQ(run.results, Lines({Refusal(EINVAL), Refusal(EINVAL), Refusal(EINVAL), Refusal(EINVAL),
                                 not_open, "0 77", "40 77", "50 77", "1 77"}));
@@ -149,7 +149,7 @@ TEST(KernelStandIn, KeepsItsDescriptorsHighAndToItself) {
   // The probe has its script at 3 and its results at 4.
   EXPECT_EQ(run.results[0], "5 77");
   EXPECT_EQ(run.results[5], "6 77");
-  // A program that the tool turns into by exec finds the same descriptors open as without the
+  // A program that the tool starts with exec has the same open descriptors as without the
   // simulation.
   const std::string inherited = run.results[6];
   RunProcess({PROBE_COMMAND, probe.path()});

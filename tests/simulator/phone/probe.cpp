@@ -1,7 +1,7 @@
-// A stand-in for the tool: does what the lines of its one file say, and writes to FILE.out what
-// came of each. A line is a command and its words; what comes of it is "RESULT ERRNO" where errno
-// was 77 before. Memory that cannot be read is named "null", "wild" or "cut" (a payload that runs
-// on into an unmapped page) in place of a payload's digits.
+// A stand-in for the tool: executes the lines of its one file, and writes their results to
+// FILE.out. A line is a command and its arguments. Its result is "RESULT ERRNO"; errno was 77
+// before the command. In place of the digits of a payload, "null", "wild" and "cut" name memory
+// that cannot be read. "cut" is a payload that continues into an unmapped page.
 #include <fcntl.h>
 #include <sys/mman.h>
 #include <sys/resource.h>
@@ -55,7 +55,7 @@ std::string FromHex(const std::string& digits) {
   return bytes;
 }
 
-// Kept for the life of the process.
+// The memory that `word` names. The bytes stay valid until the next call.
 const void* Memory(const std::string& word) {
   if (word == "null") return nullptr;
   const auto page = static_cast<size_t>(sysconf(_SC_PAGESIZE));
@@ -64,7 +64,7 @@ const void* Memory(const std::string& word) {
   char* const second = static_cast<char*>(pages) + page;
   munmap(second, page);
   if (word == "wild") return second;
-  // "cut": one of two bytes of data is there.
+  // "cut": only the first of the two bytes of data can be read.
   if (word == "cut") return memcpy(second - 3, "\2\0a", 3);
   static std::string bytes;
   bytes = FromHex(word);
@@ -82,7 +82,7 @@ long ReadAndClose(FILE* file) {
   return is_read ? static_cast<long>(value) : -2;
 }
 
-// How many bytes there are in it.
+// The number of bytes in the file, at most 64.
 long CountAndClose(FILE* file) {
   char bytes[64];
   const size_t count = fread(bytes, 1, sizeof(bytes), file);
@@ -90,7 +90,7 @@ long CountAndClose(FILE* file) {
   return static_cast<long>(count);
 }
 
-// Writes to what was opened for reading.
+// Writes to a file that was opened for reading.
 long WriteAndClose(FILE* file) {
   const long result = write(fileno(file), "2e", 2);
   const int error = errno;
@@ -106,13 +106,13 @@ long Limit(const Words& words) {
 
 std::string g_file;
 
-// For who wants to see whether this process is gone.
+// For tests that check whether this process has ended.
 long WriteId(const Words&) {
   std::ofstream(g_file + ".pid") << getpid() << std::endl;
   return 0;
 }
 
-// How many descriptors would be open in a program that this one turned into.
+// The number of descriptors that exec would leave open.
 long Inherited(const Words&) {
   long count = 0;
   for (int fd = 3; fd < 20000; ++fd) {
@@ -193,13 +193,13 @@ void Do(const std::string& line, std::ofstream& out) {
 int main(int argc, char** argv) {
   if (argc != 2) return 1;
   g_file = argv[1];
-  // Before all else, as the tool does.
+  // Opens the file before anything else, as the tool does.
   const int fd = open(argv[1], O_RDONLY);
   std::string script(1 << 20, '\0');
   const ssize_t length = read(fd, script.data(), script.size());
   if (length < 0) return 1;
   script.resize(static_cast<size_t>(length));
-  // Closed by exec, and out of the way of the descriptors that the commands open.
+  // This descriptor is opened before those of the commands, and exec closes it.
   std::ofstream out(argv[1] + std::string(".out"));
   out << "fd " << fd << std::endl;
   std::istringstream lines(script);

@@ -30,7 +30,7 @@ ProbeRun Probe::Run(const Lines& options) const {
   run.status = result.status;
   run.errors = result.errors;
   run.results = LinesOf(ContentOf(path() + ".out"));
-  // The probe's first open, and no command.
+  // The first line is the probe's own open, and not a command.
   EXPECT_EQ(run.results.empty() ? "" : run.results[0], "fd 3");
   if (!run.results.empty()) run.results.erase(run.results.begin());
   run.events = ParseJournal(result.output);

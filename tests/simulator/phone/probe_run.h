@@ -1,4 +1,4 @@
-// Running the probe (probe.cpp) inside the simulated phone.
+// Runs the probe (probe.cpp) inside the simulated phone.
 #pragma once
 
 #include <nlohmann/json.hpp>
@@ -13,7 +13,7 @@ using Json = nlohmann::json;
 struct ProbeRun {
   int status = 0;            // of apktoolkit-sim
   std::string errors;        // its standard error, and the probe's
-  Lines results;             // what came of each command: "RESULT ERRNO"; ERRNO was 77 before
+  Lines results;             // of each command: "RESULT ERRNO"; errno was 77 before
   std::vector<Json> events;  // the journal, from the event after "attached" to "exit"
 };
 
@@ -23,7 +23,7 @@ class Probe {
   explicit Probe(const Lines& commands);
 
   ProbeRun Run(const Lines& options = {}) const;
-  // The file, resolved.
+  // The resolved path of the file.
   std::string path() const { return directory_ / "script"; }
   const TempDir& directory() const { return directory_; }
 
@@ -31,10 +31,10 @@ class Probe {
   TempDir directory_;
 };
 
-// Only those of `events` that are of this kind.
+// The events of this kind.
 std::vector<Json> OfKind(const std::vector<Json>& events, const std::string& kind);
 
-// One JSON object for each line of `journal`; another line is a test failure.
+// One JSON object for each line of `journal`. A line without an object is a test failure.
 std::vector<Json> ParseJournal(const std::string& journal);
 
 Lines LinesOf(const std::string& text);

@@ -10,7 +10,7 @@ using namespace simulator;
 
 namespace {
 
-// Variables for the length of a test.
+// While it lives, the environment has these variables.
 class Environment {
  public:
   explicit Environment(const Lines& assignments) {

@@ -26,15 +26,15 @@ TEST(JournalText, QuotesBackslashesAndControlsAreEscaped) {
 }
 
 TEST(JournalText, Utf8StaysAsItIs) {
-  // The first and the last character of two, three and four bytes, around the surrogates; U+FFFE
-  // and U+FFFF are none.
+  // The first and the last character of two, of three and of four bytes, and those next to the
+  // surrogates. U+FFFE and U+FFFF are not characters.
   for (const std::string text : {"\u00a0", "\u07ff", "\u0800", "\ud7ff", "\ue000", "\ufffd",
                                  "\U00010000", "\U0010ffff", "\uf77f", "\uf800"}) {
     EXPECT_EQ(EncodeText(text), "\"" + text + "\"");
   }
 }
 
-// A journal on a terminal does not deceive the eye; a JSON reader sees no difference.
+// The text of a journal on a terminal must not mislead a person. A JSON reader gets the same text.
 TEST(JournalText, HiddenCharactersAreEscaped) {
   EXPECT_EQ(EncodeText("\u0080\u009f\u00ad\u061c\u180e"), R"("\u0080\u009f\u00ad\u061c\u180e")");
   EXPECT_EQ(EncodeText("\u200b\u200f\u2028\u202e\u2060\u206f"),

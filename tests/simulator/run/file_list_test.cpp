@@ -16,8 +16,8 @@ namespace {
 namespace fs = std::filesystem;
 using Lines = std::vector<std::string>;
 
-// The names of the list without the directory, each directory with why the tool is not run for it;
-// or one line that says why listing failed.
+// The names in the list, without the path of the directory. A listed directory also has the reason
+// why the tool is not run for it. If listing failed, the only line is the reason.
 Lines Listed(const TempDir& directory, const FileListOptions& options, size_t* others = nullptr) {
   FileList list;
   if (const auto problem = ListFiles(options, &list)) return {*problem};
@@ -87,7 +87,7 @@ TEST(FileList, DirectoryWithoutPackagesIsTold) {
             Lines({"empty: no packages", "full/a.apk"}));
 }
 
-// A path is at most 4096 bytes long.
+// A path has at most 4096 bytes, so the deepest directory cannot be read.
 TEST(FileList, DirectoryThatCannotBeReadIsTold) {
   const TempDir directory;
   directory.Write("deep/a.apk", {});
@@ -113,7 +113,7 @@ TEST(FileList, ListsAreReadByLinesOrByNulBytes) {
   const std::string with_nul = std::string("a\nb") + '\0' + '\0' + "c" + '\0';
   const std::string nul = directory.Write("nul", ToBytes(with_nul));
   EXPECT_EQ(Listed(directory, {{}, nul, true, false}), Lines({"a\nb", "c"}));
-  // The rest of such a name would be lost.
+  // The part of a name after a NUL byte would be lost.
   EXPECT_EQ(Listed(directory, {{}, nul, false, false}),
             Lines({"the list " + nul + " has NUL bytes; with -0 they end its names"}));
 }
@@ -126,7 +126,7 @@ TEST(FileList, DirectoriesOfAListAreWalkedToo) {
   EXPECT_EQ(Listed(directory, {{}, list, false, false}), Lines({"s"}));
 }
 
-// Even where there are names besides: they are not what the list was to name.
+// A list without names is an error, even if the command line names files.
 TEST(FileList, ListThatNamesNothingIsNone) {
   const TempDir directory;
   for (const char* content : {"", "\n\n"}) {

@@ -13,10 +13,10 @@ using namespace simulator;
 
 namespace {
 
-// Of "abc": FIPS 180-2, appendix B.1.
+// The digest of "abc" (FIPS 180-2, appendix B.1).
 const std::string kSha256 = "ba7816bf8f01cfea414140de5dae2223b00361a396177a9cb410ff61f20015ad";
 
-// True if a change of the file between the two calls costs the run its result.
+// True if `change` makes the run end without a result, because the file was changed.
 bool IsNoticed(const std::function<void(const std::string& file)>& change,
                const std::string& sha256 = kSha256) {
   const TempDir directory;
@@ -35,7 +35,8 @@ void SetBytes(const std::string& file, const char* bytes) {
   close(fd);
 }
 
-// As after a change that was hidden, or after chmod.
+// Writes `bytes` and restores the mtime, so that only the ctime differs. chmod and a hidden change
+// have the same effect.
 void ChangeTheInodeAlone(const std::string& file, const char* bytes) {
   struct stat before = {};
   ASSERT_EQ(stat(file.c_str(), &before), 0);
@@ -69,7 +70,7 @@ TEST(FileWatch, NoticesEachKindOfChange) {
   }));
 }
 
-// The digest decides where only the time of the inode differs.
+// If only the ctime differs, the digest decides.
 TEST(FileWatch, ChangeOfTheInodeAloneCountsIfTheBytesDiffer) {
   EXPECT_FALSE(IsNoticed([](const std::string& file) { ChangeTheInodeAlone(file, "abc"); }));
   EXPECT_TRUE(IsNoticed([](const std::string& file) { ChangeTheInodeAlone(file, "abd"); }));

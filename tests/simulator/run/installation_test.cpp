@@ -45,7 +45,7 @@ std::vector<std::string> LaidOutOf(const PackageOptions& package, InstalledAbi a
   return files;
 }
 
-// The same, of a package with these libraries.
+// The same for a package with these libraries.
 std::vector<std::string> LaidOut(const std::vector<ZipItem>& libraries, InstalledAbi abi,
                                  std::vector<std::string>* left_out = nullptr) {
   return LaidOutOf(WithLibraries(libraries), abi, left_out);
@@ -71,8 +71,8 @@ TEST(Installation, TakesTheProcessorsThatAreAskedFor) {
   EXPECT_EQ(LaidOut(kBoth, InstalledAbi::kArm64), Files({"lib/arm64/liba.so 64"}));
   EXPECT_EQ(LaidOut(kBoth, InstalledAbi::kArm), Files({"lib/arm/liba.so 32"}));
   EXPECT_EQ(LaidOut({kBoth[2]}, InstalledAbi::kAll), Files({"lib/arm/liba.so old"}));
-  // Of two ABIs for one processor, the second is left alone, even when its libraries have other
-  // names.
+  // If a package has two ABIs for one processor, the second one is not laid out, even if its
+  // libraries have other names.
   EXPECT_EQ(LaidOut({kBoth[1], {"lib/armeabi/libb.so", ToBytes("old")}}, InstalledAbi::kAll),
             Files({"lib/arm/liba.so 32"}));
 }
@@ -123,7 +123,7 @@ TEST(Installation, NamesThatNoFileCanHaveAreLeftOut) {
   EXPECT_EQ(left_out, Files({"lib/arm64-v8a/l" + longest}));
 }
 
-// Cut at one moment after another, until it is while the libraries are extracted.
+// Cuts the file at different times, until one cut happens while the libraries are extracted.
 TEST(Installation, OfAFileThatShrinksMeanwhileIsNone) {
   std::vector<ZipItem> libraries;
   for (int i = 0; i < 1000; ++i) {
@@ -172,7 +172,7 @@ TEST(Installation, TellsWhatCannotBeExtracted) {
   EXPECT_FALSE(fs::exists(place / "lib/arm64/libdata.so"));
 }
 
-// Its own name cannot stand in the way of what is laid out beside it.
+// The copy is named base.apk, so it cannot collide with the directory lib beside it.
 TEST(Installation, OfAFileThatIsCalledAsALibrarysDirectory) {
   const TempDir directory;
   const std::string file = directory / "lib";
@@ -185,7 +185,7 @@ TEST(Installation, OfAFileThatIsCalledAsALibrarysDirectory) {
   EXPECT_EQ(ContentOf(place / "lib/arm64/libfoo.so"), "\177ELF foo");
 }
 
-// The first write that does not fit, into the copy or into a library.
+// A file size limit below the size of the library makes the write fail.
 TEST(Installation, SaysWhenItCannotWrite) {
   const TempDir directory;
   const std::string file = directory / "base.apk";
@@ -208,7 +208,8 @@ TEST(Installation, SaysWhenItCannotWrite) {
   EXPECT_EQ(problem_with(3000), "");
 }
 
-// A lease is not waited for: the tool, which waits, tells of it.
+// The installation does not wait for the end of the lease. The tool waits, and the report then
+// names the lease.
 TEST(Installation, DoesNotWaitForWhoHoldsALease) {
   const TempDir directory;
   const std::string file = directory / "base.apk";
@@ -240,7 +241,7 @@ TEST(Installation, IsGoneWithItsOwner) {
   EXPECT_TRUE(fs::exists(file));
 }
 
-// A file that has no name cannot get another one, as one on another file system cannot.
+// A file without a name cannot get a hard link, like a file on another file system.
 TEST(Installation, OfAFileThatCannotBeLinkedIsACopyAndNotForEver) {
   const TempDir directory;
   MakePackage(WithLibraries({{"lib/arm64-v8a/liba.so", Bytes(3 << 20, 'a')}}))
@@ -288,7 +289,7 @@ TEST(Installation, SaysWhenThereIsNoPlaceForIt) {
   EXPECT_EQ(problem.value_or("").substr(0, 8), "TMPDIR: ");
 }
 
-// An interruption ends the writing at once, even when time is left.
+// An interruption ends the installation at once, even if time is left.
 TEST(Installation, EndsWhenTheProcessIsToEnd) {
   const TempDir directory;
   const std::string file = directory / "base.apk";
@@ -303,7 +304,7 @@ TEST(Installation, EndsWhenTheProcessIsToEnd) {
   EXPECT_EXIT(lay_out(), testing::ExitedWithCode(0), "");
 }
 
-// ---- A package that lies alone.
+// ---- A package without libraries beside it.
 
 TEST(Installation, IsMadeOfAPackageThatLiesAlone) {
   const TempDir directory;
@@ -324,7 +325,7 @@ TEST(Installation, IsMadeOfAPackageThatLiesAlone) {
     EXPECT_TRUE(is_laid_out(InstallWhen::kAlways)) << place;
     fs::remove_all(directory / "lib");
   }
-  // A link lies elsewhere, and the tool looks beside the package.
+  // A link can be in another directory, but the tool looks beside the package itself.
   const TempDir links;
   fs::create_symlink(file, links / "base.apk");
   fs::create_directories(directory / "lib/arm64");
@@ -333,7 +334,7 @@ TEST(Installation, IsMadeOfAPackageThatLiesAlone) {
             std::nullopt);
   EXPECT_FALSE(of_link.is_done());
   fs::remove_all(directory / "lib");
-  // Nobody can tell whether there is one.
+  // A link to itself does not show whether there is such a directory.
   fs::create_symlink("lib", directory / "lib");
   EXPECT_FALSE(is_laid_out(InstallWhen::kAlone));
 }
@@ -380,6 +381,6 @@ TEST(Installation, ItsPathsAreStable) {
   const std::string place = fs::path(installation.path()).parent_path().string();
   EXPECT_EQ(installation.WithStablePaths("a " + place + "/lib/x.so b " + place + "/base.apk"),
             "a <install>/lib/x.so b <install>/base.apk");
-  // It is the directory's own name alone that is another in each run.
+  // Only the path of the directory itself is replaced, and not a longer name that begins with it.
   EXPECT_EQ(installation.WithStablePaths(place + "x/<install>/lib"), place + "x/<install>/lib");
 }

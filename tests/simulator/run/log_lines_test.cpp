@@ -35,7 +35,7 @@ TEST(LogLine, EachTextHasItsMeaningAndWhatIsCaptured) {
        0},
       {"Unknown certificate type", LogMeaning::kBlockMalformed, "", 0},
       {"RSA could not set key: 5\n", LogMeaning::kKeyRefused, "5", 5},
-      // Hexadecimal, as all codes of RSA.
+      // All RSA codes are hexadecimal.
       {"RSA could not verify certificate: 14\n", LogMeaning::kCertificateRefused, "14", 20},
       {"RSA could not verify data: 1C\n", LogMeaning::kSignatureRefused, "1C", 28},
       {"SHA256 hash does not match", LogMeaning::kOtherDigest, "", 0},

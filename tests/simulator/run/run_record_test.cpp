@@ -1,4 +1,4 @@
-// In which step the tool is, and which answer of the kernel belongs to which file.
+// The step that the tool is in, and the file that each answer of the kernel belongs to.
 #include "simulator/run/run_record.h"
 
 #include <gtest/gtest.h>
@@ -34,7 +34,7 @@ RunRecord Record(Events events) {
   return TakeApart(events);
 }
 
-// The files that the kernel signed: "own", and the paths of libraries.
+// The files that the kernel signed: "own" for the file itself, and the paths of libraries.
 Lines SignedBy(const Events& events) {
   const RunRecord record = Record(events);
   Lines lines;
@@ -45,7 +45,7 @@ Lines SignedBy(const Events& events) {
 
 }  // namespace
 
-// The step goes before the path, which an archive on disk may have changed meanwhile.
+// The step counts more than the path, because the file may have been moved during the run.
 TEST(RunRecord, WhileTheToolSignsTheFileItselfEverythingIsIts) {
   EXPECT_EQ(SignedBy({kFileBegins, Sign("/data/app/moved.apk")}), Lines({"own"}));
   EXPECT_EQ(SignedBy({Log("VeltSignJni starts: 3.\n"), Sign(kFile)}), Lines({kFile}));

@@ -41,13 +41,13 @@ TEST(SignedBytes, OfTheSameFileAreTrustedUnlessItWasTouched) {
   const std::string file = directory.Write("file", ToBytes("abc"));
   SignedBytes bytes("", true);
   EXPECT_TRUE(bytes.Add(file, kLater));
-  // Nothing need be read for that.
+  // The file need not be read for this answer.
   EXPECT_TRUE(bytes.Holds(file, kPassed));
   directory.Write("file", ToBytes("abd"));
   EXPECT_FALSE(bytes.Holds(file, kLater));
 }
 
-// The same length and the same time of the last change: that of its state is another.
+// The size and the mtime are the same, and only the ctime differs.
 TEST(SignedBytes, ThatWereChangedWithoutASignInTheirTimeAreNotTrusted) {
   const TempDir directory;
   const std::string file = directory.Write("file", ToBytes("abc"));
@@ -85,7 +85,7 @@ TEST(SignedBytes, AreForLaterRunsAloneWhereTheFilesOfARunDoNotShareThem) {
   EXPECT_TRUE(second.Holds(file, kLater));
 }
 
-// Reading any of them would wait for ever, or never end.
+// Reading a pipe would wait forever, and reading a device would never end.
 TEST(SignedBytes, OfPipesAndDevicesAreNotRead) {
   const TempDir directory;
   const std::string pipe = directory / "pipe";

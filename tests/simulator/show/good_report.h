@@ -1,4 +1,4 @@
-// The report of a package that was signed, and has nothing else to tell.
+// The report of a package that was signed without any warning.
 #pragma once
 
 #include <string>

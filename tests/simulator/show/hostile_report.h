@@ -1,4 +1,4 @@
-// A report in which every text that a hostile file can bring is the same one.
+// A report in which every text that a hostile file controls is the same text.
 #pragma once
 
 #include <string>
@@ -9,7 +9,7 @@
 namespace simulator {
 
 // The texts of a hostile file: markup for every place of a page, control sequences, bytes that are
-// not UTF-8, characters that turn the direction of writing, and marks of the page's template.
+// not UTF-8, characters that change the direction of the text, and marks of the page's template.
 inline const char kHostileText[] =
     "</title></style><script>document.title='hostile'</script><img src=x onerror=alert(1)>"
     "\"'><a href='javascript:alert(1)'>&lt;&{{verdict}}{{{verdict}}}{{&verdict}}-->"

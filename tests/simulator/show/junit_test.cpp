@@ -24,7 +24,7 @@ std::string XmlOf(const std::vector<Report>& reports) {
   return junit.Xml();
 }
 
-// The elements as Python's reader of XML finds them: of each its name, its attributes and its text.
+// The elements that Python's XML parser finds: the name, the attributes and the text of each.
 std::string ReadByPython(const std::string& xml) {
   const DiskFile file({xml.begin(), xml.end()});
   const ProcessResult run = RunProcess({"python3", "-c", R"(
@@ -99,7 +99,7 @@ TEST(Junit, OnlyWhatEndsWithStatusZeroPasses) {
       {Verdict::kNotSimulated, "<error "},
   };
   for (const auto& [verdict, element] : kExpected) {
-    // Be the item that says why there or not.
+    // The element is the same with and without an item that states the reason.
     Report bare = GoodReport("a");
     bare.verdict = verdict;
     for (const Report& report : {Refused("a", verdict, &cause::kToolError), bare}) {
@@ -120,7 +120,8 @@ TEST(Junit, HostileTextsAreTexts) {
   EXPECT_EQ(read.find("\nimg "), std::string::npos);
 }
 
-// Of all characters, those that XML does not know among them (XML 1.0 §2.2), and of all bytes.
+// The text has all bytes, all characters from U+0080 to U+FFFF, and a few above. Some of them are
+// characters that XML does not allow (XML 1.0 §2.2).
 TEST(Junit, EveryCharacterMakesAWholeDocument) {
   std::string text;
   for (int byte = 1; byte < 256; ++byte) text += static_cast<char>(byte);

@@ -19,7 +19,7 @@ Report Example(const std::string& file, Verdict verdict, size_t warnings = 0) {
   return report;
 }
 
-// The page's part from the first of these texts to the end of the second.
+// The part of the page from the start of `from` to the end of `to`.
 std::string PartOf(const std::vector<Report>& reports, const std::string& from,
                    const std::string& to) {
   Page page({0, ""});
@@ -30,7 +30,7 @@ std::string PartOf(const std::vector<Report>& reports, const std::string& from,
   return html.substr(start, html.find(to, start) + to.size() - start);
 }
 
-// The table's rows without their markup, cells between bars.
+// The rows of the table without markup, with a bar after each cell.
 std::vector<std::string> RowsOf(const std::vector<Report>& reports) {
   const std::string body = PartOf(reports, "<tbody", "</tbody>");
   const std::regex row("<tr [^\n]*");

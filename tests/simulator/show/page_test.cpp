@@ -13,7 +13,7 @@ using namespace simulator;
 
 namespace {
 
-// 2026-11-22 09:08:07 UTC, as "date -u -d @1795338487" says it.
+// 2026-11-22 09:08:07 UTC, as "date -u -d @1795338487" prints it.
 constexpr std::time_t kBegun = 1795338487;
 
 std::string PageOf(const std::vector<Report>& reports) {
@@ -34,7 +34,7 @@ size_t Count(const std::string& page, const std::string& part) {
   return count;
 }
 
-// Everything between "<" and ">": what a browser takes for markup.
+// Everything between "<" and ">", which a browser reads as markup.
 std::vector<std::string> TagsOf(const std::string& page) {
   static const std::regex kTag("<[^>]*>");
   return {std::sregex_token_iterator(page.begin(), page.end(), kTag), {}};
@@ -88,7 +88,7 @@ TEST(Page, BeginsAsEveryPageDoes) {
   EXPECT_EQ(PageOf(Example(Verdict::kSigned)).substr(0, kPageStart.size()), kPageStart);
 }
 
-// Nobody but the reader's own browser is asked for anything, and nothing runs.
+// The page loads nothing from elsewhere, and runs no script.
 TEST(Page, HasNoScriptAndNothingFromElsewhere) {
   const std::string page = PageOf(HostileReport("x"));
   EXPECT_TRUE(Has(page, "content=\"default-src 'none'; style-src 'unsafe-inline'; "));
@@ -101,9 +101,9 @@ TEST(Page, HasNoScriptAndNothingFromElsewhere) {
   EXPECT_FALSE(std::regex_search(page, std::regex("@import|https?:|url\\((?!#)")));
 }
 
-// A name with markup in it changes nothing but the texts.
+// A name with markup in it changes only the texts.
 TEST(Page, HasTheSameMarkupWhateverFilesAreCalled) {
-  // The hostile names have a directory as well.
+  // The plain name has a directory, because the hostile name has one.
   const std::string plain = PageOf({HostileReport("x/x"), HostileReport("x/x")});
   const std::string hostile = PageOf({HostileReport(kHostileText), HostileReport(kHostileText)});
   EXPECT_EQ(TagsOf(hostile), TagsOf(plain));
@@ -271,7 +271,7 @@ TEST(Page, HasTheAlarmsBelowTheFile) {
   EXPECT_TRUE(Has(PageOf(report), "<p class=\"fact\">! phones install it as &quot;com.evil&quot;"));
 }
 
-// A name that is too long is cut before the key, and not the key for its sake.
+// A name that is too long is cut, and the key after it is shown.
 TEST(Page, ShowsTheKeyBehindALongName) {
   Report report = Example(Verdict::kSigned);
   report.signer.emplace();
@@ -376,7 +376,7 @@ TEST(Page, SaysWhereTheInstallerWasNotAskedOrGaveUp) {
   EXPECT_TRUE(Has(page, "</span> signs only a part of it</td>"));
 }
 
-// The command line's demands are not the tool's.
+// The demands of the command line do not change what the tool does.
 TEST(Page, ToolSignsAPackageThatTheGateRefuses) {
   Report report = Example(Verdict::kNotAccepted);
   report.chain = {{"key", LinkState::kHolds, ""}};
@@ -394,7 +394,7 @@ TEST(Page, ToolSignsAPackageThatTheGateRefuses) {
   EXPECT_TRUE(Has(PageOf(report), "</span> signs it</td>"));
 }
 
-// A name of an option, and its value, stay in one piece; nothing of the text is lost.
+// The name and the value of an option stay on one line, and no text is lost.
 TEST(Page, KeepsTheNamesOfOptionsWhole) {
   Report report = Example(Verdict::kSigned);
   report.items = {Library("a", &cause::kLibraryNotInstalled)};

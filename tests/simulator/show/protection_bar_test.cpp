@@ -16,7 +16,7 @@ std::vector<double> Percents(const std::vector<DrawnPart>& parts) {
 
 }  // namespace
 
-// 1000 bytes, of which 100 lie between the entries.
+// The file has 1000 bytes, and 100 of them are between the entries.
 TEST(DrawnBar, HasEachPartAndWhatLiesBetweenTheEntries) {
   const auto parts = DrawBar({{1, 400}, {2, 300}, {3, 150}, {4, 50}, {}}, 1000);
   EXPECT_EQ(Percents(parts), std::vector<double>({40, 30, 15, 5, 10}));
@@ -24,7 +24,8 @@ TEST(DrawnBar, HasEachPartAndWhatLiesBetweenTheEntries) {
   EXPECT_FALSE(parts[4].has_entries);
 }
 
-// Five parts of at least 0.75 leave 96.25 to divide: half of it, and 0.75, is 48.875.
+// Each of the five parts is at least 0.75 wide. The parts share the remaining 96.25 by their bytes.
+// The first part is 0.75 plus half of 96.25, which is 48.875.
 TEST(DrawnBar, IsAsWideAsItMayBeAndShowsTheLeastByte) {
   const auto parts = DrawBar({{1, 500'000}, {1, 499'000}, {1, 1}, {1, 499}, {}}, 1'000'000);
   EXPECT_DOUBLE_EQ(parts[0].width, 48.875);
@@ -45,7 +46,7 @@ TEST(DrawnBar, DrawsNothingOfWhatIsNotThere) {
   EXPECT_DOUBLE_EQ(parts[1].width, 100);
 }
 
-// As in an archive whose entries share their bytes.
+// The entries of an archive can share their bytes.
 TEST(DrawnBar, TakesMoreBytesThanTheFileHas) {
   const auto parts = DrawBar({{1, UINT64_MAX}, {1, UINT64_MAX}, {}, {}, {}}, 1000);
   EXPECT_EQ(Percents(parts), std::vector<double>({50, 50, 0, 0, 0}));

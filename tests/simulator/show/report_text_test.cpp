@@ -21,7 +21,8 @@ std::string Printed(const Report& report, const Look& look = kUtf8,
   return out.str();
 }
 
-// One of each state, without signer and events.
+// A report with items that are done, refused and without anything to sign. It has no signer and no
+// events.
 Report Example() {
   Report report;
   report.file = "base.apk";
@@ -158,7 +159,7 @@ TEST(ReportText, RefusalsAreRedAndTheGoodVerdictIsGreen) {
   EXPECT_EQ(lines[3].substr(0, 5), "\x1b[31m");
 }
 
-// Names of up to 40 characters make the column, and longer ones stand out of it.
+// Names of up to 40 characters set the width of the column, and longer names extend past it.
 TEST(ReportText, OneLongNameMovesNoOther) {
   const std::string longest(40, 'l');
   const auto column = [&](const std::string& other) {
@@ -174,7 +175,7 @@ TEST(ReportText, OneLongNameMovesNoOther) {
   EXPECT_EQ(column(longest + "l"), 4U + 40 + 2);
 }
 
-// A cure that many have in common is said once.
+// A cure that neighbours share is printed once.
 TEST(ReportText, NeighboursShareWhatToDo) {
   Report report = Example();
   report.items = {

@@ -10,7 +10,7 @@ using namespace simulator;
 
 namespace {
 
-// With what a log has of the file.
+// A good report with the size and the digest of the file.
 Report Good(const std::string& file) {
   Report report = GoodReport(file);
   report.file_size = 7;
@@ -50,7 +50,7 @@ TEST(Sarif, BeginsAsALaterRunExpectsItOfWhatItReplaces) {
   EXPECT_EQ(Sarif().Log().substr(0, kSarifStart.size()), kSarifStart);
 }
 
-// Compared as a whole, so that no member is added or lost unnoticed.
+// The log is compared as a whole, so that the test notices each added or lost member.
 TEST(Sarif, HasTheWholeRun) {
   Report refused = Good("b.apk");
   refused.verdict = Verdict::kPartlySigned;
@@ -146,7 +146,8 @@ TEST(Sarif, HostileTextsAreTexts) {
   EXPECT_EQ(message.find('\x1b'), std::string::npos);
 }
 
-// RFC 3986 §2.3 has the characters that stand for themselves; §4.2 says why a colon must not.
+// RFC 3986 §2.3 lists the characters that are not percent-encoded. §4.2 says why a colon must be
+// encoded.
 TEST(UriOf, IsAReferenceWhateverTheName) {
   EXPECT_EQ(UriOf("base.apk"), "base.apk");
   EXPECT_EQ(UriOf("../a-b/c_d~e.apk"), "../a-b/c_d~e.apk");

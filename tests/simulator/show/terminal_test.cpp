@@ -23,7 +23,7 @@ TEST(Printable, WhatATerminalWouldObeyIsShownAsBytes) {
   EXPECT_EQ(Printable("\xe9\xff", kUtf8), "\\xe9\\xff");
 }
 
-// Such characters have "gpj.exe" read as "exe.jpg".
+// These characters can make "gpj.exe" look like "exe.jpg".
 TEST(Printable, WhatTurnsOrHidesTextIsShownAsBytes) {
   EXPECT_EQ(Printable("a\u202eb", kUtf8), "a\\xe2\\x80\\xaeb");
   EXPECT_EQ(Printable("\u200b\u2028\u2066\ufeff", kUtf8),
@@ -32,7 +32,7 @@ TEST(Printable, WhatTurnsOrHidesTextIsShownAsBytes) {
   EXPECT_EQ(Printable("\u2013\u2027\u2030\u2070\ufefe", kUtf8), "\u2013\u2027\u2030\u2070\ufefe");
 }
 
-// In another character set, bytes of UTF-8 could be anything, control characters among them.
+// In another character set, bytes of UTF-8 could be any characters, including control characters.
 TEST(Printable, OutsideUtf8NothingButAsciiIsShown) {
   EXPECT_EQ(Printable("é!", kAscii), "\\xc3\\xa9!");
 }

@@ -85,7 +85,7 @@ TEST(Timeline, RefusalsStandOut) {
 )";
   EXPECT_EQ(Printed(journal), timeline);
 
-  // In colours, the same without the colours; six failures are red.
+  // With colours, only the colour codes are added. Six failures are red.
   std::string coloured = Printed(journal, true);
   int red = 0;
   for (const std::string code : {"\x1b[31m", "\x1b[0m"}) {
@@ -108,7 +108,7 @@ TEST(Timeline, EmptyPayloadIsCalledSo) {
 )");
 }
 
-// 32 bytes are one.
+// A payload of 32 bytes is called a digest.
 TEST(Timeline, OnlyAPayloadOfADigestsLengthIsCalledOne) {
   const auto payload = [](const std::string& data) {
     const Events events = ParseEvents("{\"event\":\"sign\",\"path\":\"/a\",\"payload\":\"0000" +

@@ -8,7 +8,7 @@ using namespace simulator;
 
 namespace {
 
-// A report with something of everything.
+// A report with values for every part of the event.
 Report WholeReport() {
   Report report;
   report.file = "base.apk";
@@ -75,7 +75,8 @@ Report WholeReport() {
 
 }  // namespace
 
-// Compared as a whole, so that no member is added, lost or taken from another one unnoticed.
+// The event is compared as a whole, so that the test notices each member that is added, lost or
+// confused with another one.
 TEST(VerdictEvent, HoldsTheWholeReport) {
   const Json event = ParseJournal(VerdictEvent(WholeReport())).at(0);
   EXPECT_EQ(event, Json::parse(R"json({
@@ -134,7 +135,7 @@ TEST(VerdictEvent, HoldsTheWholeReport) {
       {"link": "manifest", "state": "not-reached", "text": "y"}]})json"));
 }
 
-// A tool of somebody else's has no version that is known here.
+// The simulator does not know the version of another tool.
 TEST(VerdictEvent, OtherToolIsKnownByItsBytesAlone) {
   Report report;
   report.tool = {false, "88"};

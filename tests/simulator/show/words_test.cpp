@@ -70,7 +70,7 @@ TEST(HeadFacts, NameTheSignerAndTheKernelsKey) {
             Lines({"com.app", "signer CN=a, RSA-2048, key 98302ce8...f64646"}));
   report.key->bits = 0;
   EXPECT_EQ(HeadFacts(report, "…")[1], "signer CN=a, RSA, key 98302ce8…f64646");
-  // A payload may be anything, and have too few digits to leave some out.
+  // A payload can have any length. A short one is shown whole.
   report.key->sha256 = "ab";
   EXPECT_EQ(HeadFacts(report, "…")[1], "signer CN=a, RSA, key ab");
   report.key->sha256 = "98302ce800f64646";
@@ -124,7 +124,7 @@ TEST(HeadFacts, HaveTheInstallersReasonWhereTheVerdictIsHis) {
   EXPECT_EQ(HeadFacts(report, "..."), Lines({"phones do not install it: why"}));
 }
 
-// Nobody who looks at the first line alone may miss that another signed.
+// The first line alone must show that another signer signed.
 TEST(HeadFacts, HaveASignerWhoWasNotExpectedBesideAnyReason) {
   Report report = WithSigner();
   report.verdict = Verdict::kPartlySigned;
@@ -138,7 +138,7 @@ TEST(HeadFacts, HaveASignerWhoWasNotExpectedBesideAnyReason) {
   report.verdict = Verdict::kNotAccepted;
   report.items = {signer};
   EXPECT_EQ(HeadFacts(report, "..."), Lines({"its signer is not one that --signer names: who"}));
-  // That the signer of a refused file is not known follows from the refusal.
+  // The reason signer-not-verified follows from the refusal, so the line does not show it.
   report.verdict = Verdict::kRefused;
   report.items = {Library(&cause::kLibraryMissing), signer};
   report.items[0].state = ItemState::kRefused;
@@ -170,7 +170,8 @@ TEST(SignerRows, SayOfTheKeyWhatTheKernelGot) {
                              "98302ce8 (of the modulus alone: what the kernel got)"));
   report.key->was_got = false;
   EXPECT_EQ(SignerRows(report)[5].second, "98302ce8 (of the modulus alone, as the tool reads it)");
-  // A certificate in which others read no key is shown all the same, and so is the key alone.
+  // A certificate without a key that others can read is also shown, and so is a key without a
+  // certificate.
   report.signer->key = {"RSA", 0, "spki", ""};
   EXPECT_EQ(SignerRows(report).size(), 5U);
   EXPECT_EQ(SignerRows(report)[3].first, "public key SHA-256 digest");

@@ -20,7 +20,7 @@ const CertificateFacts kOwner = SignerWith('a');
 const CertificateFacts kOther = SignerWith('b');
 const CertificateFacts kThird = SignerWith('c');
 
-// Of a package that the tool verified and the kernel signed.
+// The report of a package that the tool verified and the kernel signed.
 Report SignedBy(const CertificateFacts& signer, const std::string& file = "base.apk") {
   Report report;
   report.file = file;
@@ -32,7 +32,7 @@ Report SignedBy(const CertificateFacts& signer, const std::string& file = "base.
   return report;
 }
 
-// The judgement of phones that take it by these signers.
+// The judgement of phones that install the package for these signers.
 RangeJudgement Takes(int first, const std::vector<InstallerSigner>& signers) {
   RangeJudgement range;
   range.levels = {first, kNewestLevel};
@@ -56,7 +56,7 @@ Lines Added(const Report& before, const Report& after) {
   return codes;
 }
 
-// The result for one file where these signers are expected.
+// The result for one file.
 struct Judged {
   Lines codes;
   Verdict verdict;
@@ -98,7 +98,7 @@ TEST(ReadDigest, TakesNothingElse) {
   for (const std::string& text :
        {std::string(), digits, digits + "000", digits + "0", digits + "0g", digits + " 0",
         "0x" + digits, digits + "0\n", ":" + digits + "0", digits + ":00",
-        // The length is that of pairs with colons, and the colons are elsewhere.
+        // These texts are as long as pairs with colons, but the colons are in other places.
         std::string(64, '0') + std::string(31, ':'), std::string(95, '0'), std::string(95, ':')}) {
     EXPECT_EQ(ReadDigest(text), std::nullopt) << text;
   }
@@ -142,7 +142,8 @@ TEST(Gate, SaysThatASignerHasNoReadableName) {
                 kOther.key.modulus_sha256 + ")");
 }
 
-// The kernel gets the modulus. A certificate that shows another key is a decoy.
+// The gate compares the modulus that the kernel gets. A certificate that shows another key does not
+// count.
 TEST(Gate, CertificateOfAnotherKeyThanTheKernelGetsCountsForNothing) {
   Report report = SignedBy(kOwner);
   report.key->sha256 = kOther.key.modulus_sha256;
@@ -161,7 +162,7 @@ TEST(Gate, KeyWithoutACertificateIsKnownByItsModulus) {
   ExpectUnexpected({kOwner.key.modulus_sha256}, report);
 }
 
-// Anyone can put the owner's modulus behind an exponent of his own.
+// Anyone can make signatures for the owner's modulus with a forgeable exponent such as 1.
 TEST(Gate, ForgeableKeyIsNobodys) {
   Report report = SignedBy(kOwner);
   report.warnings = {{&cause::kForgeableKey, "1"}};
@@ -174,18 +175,18 @@ TEST(Gate, SignersOfTheNewestSchemeMustBeExpectedAsWell) {
   const Lines owner = {kOwner.sha256};
   const RangeJudgement all_own = Takes(27, {{"v1", kOwner}, {"v2", kOwner}});
   ExpectTaken(owner, InstalledFor(SignedBy(kOwner), {all_own}));
-  // An older scheme is nobody's concern.
+  // The signers of an older scheme do not count.
   ExpectTaken(owner, InstalledFor(SignedBy(kOwner), {Takes(27, {{"v2", kOther}, {"v3", kOwner}})}));
   const Report other =
       InstalledFor(SignedBy(kOwner), {Takes(27, {{"v2", kOwner}, {"v3", kOther}})});
   ExpectUnexpected(owner, other);
   ExpectTaken({kOwner.sha256, kOther.sha256}, other);
-  // Each of several signers, and those of phones of any level.
+  // Each of several signers must be expected, for phones of every level.
   ExpectUnexpected(owner,
                    InstalledFor(SignedBy(kOwner), {Takes(27, {{"v2", kOther}, {"v2", kOwner}})}));
   ExpectUnexpected(owner, InstalledFor(SignedBy(kOwner), {all_own, Takes(33, {{"v3", kOther}})}));
   ExpectUnexpected(owner, InstalledFor(SignedBy(kOwner), {Takes(27, {{"v2", kOther}}), all_own}));
-  // Phones that refuse the package install it for nobody.
+  // Phones that refuse the package do not install it for any signer.
   RangeJudgement refuses = Takes(33, {{"v3", kOther}});
   refuses.is_verified = false;
   ExpectTaken(owner, InstalledFor(SignedBy(kOwner), {all_own, refuses}));
@@ -206,7 +207,7 @@ TEST(Gate, SignerOfWhatWasNotVerifiedIsNotKnown) {
   const Judged judged = With({kOwner.sha256}, report);
   EXPECT_EQ(judged.codes, Lines({"signer-not-verified"}));
   EXPECT_EQ(judged.verdict, Verdict::kRefused);
-  // The tool verified it, and the kernel refused.
+  // The tool verified the package, but the kernel refused to sign it.
   report.items[0].is_verified = true;
   EXPECT_EQ(With({kOwner.sha256}, report).codes, Lines());
   EXPECT_EQ(With({kOther.sha256}, report).codes, Lines({"signer-unexpected"}));
@@ -246,7 +247,7 @@ TEST(Gate, MakesNoVerdictBetter) {
 
 namespace {
 
-// The same where warnings count as refusals.
+// The result for one file if warnings count as refusals.
 Judged WithoutWarnings(const Report& report, const Lines& signers = {}) {
   GateOptions options;
   options.refuses_warnings = true;
@@ -293,7 +294,7 @@ TEST(GateOfWarnings, AnotherSignerOfTheNewestSchemeCountsAsOne) {
   EXPECT_EQ(report.items[1].reason.detail, "phones install it for another signer, CN=b");
 }
 
-// The signer's reason comes first, and both are told.
+// The refusal for the signer comes first, and both refusals are reported.
 TEST(GateOfWarnings, ComesBehindTheSigner) {
   Report report = SignedBy(kOther);
   report.warnings = {{&cause::kWeakKey, "1024"}};
@@ -316,7 +317,7 @@ TEST(GateOfWarnings, WhatIsRefusedAnywayStaysAsItIs) {
 
 namespace {
 
-// The code that the last of the files gets; all before it get none.
+// The codes that the last file gets. The files before it must get none.
 Lines AfterOthers(std::vector<Report> reports) {
   const GateOptions options;
   Gate gate(options);
@@ -402,7 +403,7 @@ TEST(GateOfOnePackage, SignersAreComparedInAnyOrder) {
                 kOther.key.modulus_sha256 + ")");
 }
 
-// Where no installer is asked, a file counts as signed by those that it names.
+// If no installer is asked, a file counts as signed by the signers that it names.
 TEST(GateOfOnePackage, WithoutAnInstallerTheNewestSchemesThatFilesNameAreCompared) {
   Report by_owner = SignedBy(kOwner), by_other = SignedBy(kOwner);
   by_owner.newer = {{"v2", kOther}, {"v3", kOwner}};
@@ -422,7 +423,7 @@ TEST(GateOfOnePackage, OthersAreNotCompared) {
   Report other_nameless = SignedBy(kOther);
   other_nameless.package_name = "";
   EXPECT_EQ(AfterOthers({nameless, other_nameless}), Lines());
-  // A file that was refused claims its signer, and can accuse no other file.
+  // The signer of a refused file is only a claim, so it is not compared with other files.
   Report refused = SignedBy(kOther);
   refused.verdict = Verdict::kRefused;
   refused.items[0].is_verified = false;

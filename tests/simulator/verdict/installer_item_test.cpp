@@ -85,7 +85,7 @@ TEST(InstallerItem, NamesTheEntry) {
             start + "a/b was added after signing: the manifest does not list it");
   EXPECT_EQ(Why({"JAR_SIG_DUPLICATE_ZIP_ENTRY", {"a/b"}, ""}),
             start + "a/b is in it more than once");
-  // An answer without the parameter still has a sentence.
+  // If an answer lacks the parameter, the item shows the text of the answer.
   EXPECT_EQ(Why({"JAR_SIG_DUPLICATE_ZIP_ENTRY", {}, "twice"}),
             start + "twice (JAR_SIG_DUPLICATE_ZIP_ENTRY)");
 }
@@ -95,7 +95,7 @@ TEST(InstallerItem, VerifierThatGaveUpIsARefusal) {
             "installer-gave-up: the installer's verifier gave up: it ended");
 }
 
-// Phones go by the newest scheme that they know, and by all of its signers.
+// Phones use the newest scheme that they know, with all of its signers.
 TEST(OtherSigner, IsOneOfTheNewestScheme) {
   Report report;
   report.signer = WithKey("own");

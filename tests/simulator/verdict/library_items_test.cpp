@@ -18,7 +18,8 @@ TEST(MakeReport, LibraryWithOtherBytesIsRefused) {
   EXPECT_FALSE(report.items[1].is_verified);
 }
 
-// The library's item where this is logged of it, and opening it ends like this.
+// The item of a library for which the tool logs `error`. `opening` is the errno of opening it, or
+// 0.
 std::string LibraryItem(const std::string& error, int opening = 0, bool has_directory = false,
                         const JudgeOptions& options = {}) {
   const Report report = Made(
@@ -72,7 +73,7 @@ TEST(MakeReport, LibraryThatThePackageKeepsIsToldApart) {
             "lib/arm64/libfoo.so absent library-in-package");
 }
 
-// The tool's walk ends there, and what comes after is not signed however good it is.
+// The tool's walk ends at the damaged entry. Later libraries are not signed, even if they are good.
 TEST(MakeReport, LibraryBehindADamagedEntryIsRefusedIfItLiesThere) {
   const auto items = [](int error, bool is_strict) {
     PackageFacts facts =
@@ -140,7 +141,8 @@ TEST(MakeReport, LibrariesOfARefusedPackageFollowIt) {
   EXPECT_FALSE(report.items[0].is_verified);
 }
 
-// The tool names no path when it may not sign; the order of the libraries tells which it was.
+// If the tool may not sign, it names no path. The order of the libraries then shows which library
+// it was.
 TEST(MakeReport, LibrariesThatTheKernelWasNotAskedForAreKnownByTheirOrder) {
   const PackageFacts facts = WithLibraries({"lib/arm64-v8a/liba.so", "lib/arm64-v8a/libb.so"});
   const Report report =

@@ -1,4 +1,4 @@
-// Runs of the tool, written down as events, and the reports that are made of them.
+// Runs of the tool, as events, and the reports about these runs.
 #pragma once
 
 #include "simulator/verdict/make_report.h"
@@ -71,7 +71,7 @@ inline Lines Items(const Events& events, const PackageFacts& facts = {}) {
   return ItemsOf(Made(events, facts));
 }
 
-// The tool's log lines while it takes up one file for the kernel.
+// The tool's log lines before it asks the kernel to sign, and at the start of each step.
 inline const Json kTakesUp = Log(4, "VeltSignOat: Apk case.\n");
 inline const Json kLibrariesStart = Log(4, "VeltSignJni starts: 3.\n");
 inline const Json kFileStart = Log(4, "VeltSign starts: zip_fd = 3, fd = 3.\n");
@@ -80,7 +80,7 @@ inline Json CannotSign(int error) {
   return Log(6, "VELT can't sign a file (result=10000, errno " + std::to_string(error) + ": x).\n");
 }
 
-// The facts of a package with these libraries; opening each gives `error`.
+// The facts of a package with these libraries. `error` is the errno of opening each one, or 0.
 inline PackageFacts WithLibraries(const Lines& entries, int error = 0, bool has_directory = false) {
   PackageFacts facts;
   for (const std::string& name : entries) {

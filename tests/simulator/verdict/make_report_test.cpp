@@ -93,8 +93,8 @@ TEST(MakeReport, IntegrityValuesAreReadAsTheToolReadsThem) {
   EXPECT_EQ(reason(nullptr), "package refused integrity-missing");
 }
 
-// Payload and key are those that the kernel got, with the package or else with a library. The
-// tool's own code is asked where it got none.
+// The payload and the key are those that the kernel got with the package, or else with a library.
+// If the kernel got none, the key is the one that the tool's own code reads.
 TEST(MakeReport, KeyIsTheOneThatTheKernelGot) {
   const std::string own(64, 'a'), other(64, 'b');
   PackageFacts facts = WithLibraries({"lib/arm64-v8a/libfoo.so"});
@@ -117,7 +117,7 @@ TEST(MakeReport, KeyIsTheOneThatTheKernelGot) {
   EXPECT_EQ(told({Log(6, "Can't validate manifest.\n")}), "a 2048 not got ");
 }
 
-// Of one file as well, and of a library whose path nobody told.
+// Several answers for one file count, and so does an answer for a library without a path.
 TEST(MakeReport, EachAnswerOfTheKernelCounts) {
   const std::string refused = "kernel-refused EPERM: Operation not permitted";
   EXPECT_EQ(Items({kFileStart, kTakesUp, Sign(kFile, kPackagePayload, EPERM),

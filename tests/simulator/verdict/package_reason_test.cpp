@@ -8,7 +8,8 @@ using namespace simulator;
 
 namespace {
 
-// Each with a line end, unless it is one of those that the tool logs without.
+// The record of a run with these errors. Each error gets a line end, unless the tool logs it
+// without one.
 RunRecord After(const Lines& errors) {
   RunRecord run;
   for (const std::string& error : errors) {
@@ -28,7 +29,7 @@ std::string Why(const Lines& errors, const PackageFacts& facts) {
   return Code(WhyRefused(After(errors), facts));
 }
 
-// A package whose signature reads.
+// A package with a signature that can be read.
 PackageFacts Signed() {
   PackageFacts facts;
   facts.kind = FileKind::kArchive;
@@ -124,7 +125,7 @@ TEST(WhyRefused, OfACertificate) {
   facts.jar.certificate->is_self_issued = false;
   facts.jar.certificate->issuer = "CN=Authority";
   EXPECT_EQ(Why(errors, facts), "certificate-issued CN=Authority");
-  // The largest and the smallest key that the tool takes, in bytes, and what is beyond.
+  // The largest and the smallest key that the tool accepts, in bytes, and the sizes next to them.
   const auto of_size = [&](uint32_t size) {
     facts.jar.key->size = size;
     facts.jar.key->bits = static_cast<int>(size) * 8 - 1;

@@ -7,7 +7,7 @@ using namespace simulator;
 namespace {
 
 // A package with a dex file, two libraries, a resource, an entry that is not listed, and its
-// signature; each entry has another number of bytes.
+// signature. Each entry has a different number of bytes.
 PackageFacts Package() {
   PackageFacts facts;
   facts.jar.manifest = Archive::ReadResult::kRead;
@@ -78,7 +78,7 @@ TEST(Protection, NothingIsVerifiedThatWasNotCompared) {
   EXPECT_EQ(verified(false, true), 10U);
 }
 
-// The tool looked at the library beside the package, and the package's own is another one.
+// The tool checked the library beside the package. The library inside the package differs from it.
 TEST(Protection, EntryThatIsOtherThanListedIsNotVerified) {
   PackageFacts facts = Package();
   facts.entries[1].digest = EntryDigest::kDiffers;

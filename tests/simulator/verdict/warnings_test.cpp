@@ -20,7 +20,7 @@ CertificateFacts CertificateWith(const std::string& subject, const std::string& 
 
 const CertificateFacts kJarSigner = CertificateWith("CN=jar", kModulus, "jar key");
 
-// A package of which there is nothing to say.
+// A package without any warning.
 PackageFacts Good() {
   PackageFacts facts;
   facts.jar.manifest = Archive::ReadResult::kRead;
@@ -71,7 +71,7 @@ TEST(Warnings, CertificateThatShowsAnotherKeyThanTheKernelGets) {
   EXPECT_EQ(cause::kCertificateOtherKey.severity, Severity::kAlarm);
 }
 
-// The key that the kernel got counts, and not the one that the file shows by now.
+// The key that the kernel got counts, even if the file now shows another key.
 TEST(Warnings, KernelThatGotAnotherKeyThanTheCertificateShows) {
   Report report = ReportOf(Good());
   report.key->sha256 = kOther;
@@ -143,15 +143,15 @@ TEST(Warnings, OtherKeyOfAnyNewerSigner) {
   EXPECT_EQ(Warnings(facts), Lines({"other-key: the v2 " + told, "other-key: the v3 " + told}));
 }
 
-// The same modulus with another exponent is another key, and so is the key of the certificate where
-// the kernel gets another.
+// The same modulus with another exponent is another key. The key of the certificate is also another
+// key if the kernel gets a different modulus.
 TEST(Warnings, OtherKeyWithAPartOfTheJarSigners) {
   PackageFacts facts = Good();
   facts.newer = {{"v2", CertificateWith("CN=other", kModulus, "other key")}};
   EXPECT_EQ(Warnings(facts).size(), 1U);
   facts.newer = {{"v2", CertificateWith("CN=other", kOther, "jar key")}};
   EXPECT_EQ(Warnings(facts).size(), 1U);
-  // Without a certificate that reads, the kernel's key is all there is to compare.
+  // Without a readable certificate, only the kernel's key can be compared.
   facts.jar.certificate.reset();
   facts.newer = {{"v2", CertificateWith("CN=other", kOther, "jar key")}};
   EXPECT_EQ(Warnings(facts).size(), 2U);
@@ -205,7 +205,7 @@ TEST(Warnings, EntriesThatAreNotListedOrDamaged) {
   facts.entries.push_back({{"lost", 1000, true}, false, false});
   EXPECT_EQ(Warnings(facts),
             Lines({"entries-damaged: 1 entry: lost", "unlisted-entries: 2 entries (1100 bytes)"}));
-  // Without a manifest nothing says what is listed.
+  // Without a manifest, the listed entries are not known.
   facts.jar.manifest = Archive::ReadResult::kMissing;
   EXPECT_EQ(Warnings(facts), Lines({"entries-damaged: 1 entry: lost"}));
   facts.entries = {{{"added", 1, false}, false, false}};
@@ -312,7 +312,8 @@ TEST(Warnings, DigestsForWhichCollisionsAreKnown) {
                                     "signature block is made with SHA1"}));
 }
 
-// The key is the JAR signer's. The certificate is another one, and phones go by it.
+// The certificate has the JAR signer's key, but is another certificate. Phones use this
+// certificate.
 TEST(Warnings, CertificateOfANewerScheme) {
   PackageFacts facts = Good();
   NewerSignerFacts newer = {"v2", *facts.jar.certificate};
@@ -333,7 +334,8 @@ TEST(Warnings, CertificateOfANewerScheme) {
   EXPECT_EQ(Warnings(facts), Lines());
 }
 
-// date -u -d @1000000000: 2001-09-09 01:46:40. The second that a certificate names is its last.
+// date -u -d @1000000000: 2001-09-09 01:46:40. The certificate is still valid in the second that
+// notAfter names.
 TEST(Warnings, CertificateThatExpired) {
   const auto told = [](std::optional<int64_t> end, int64_t now) {
     PackageFacts facts = Good();
