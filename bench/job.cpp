@@ -136,7 +136,8 @@ void ReadWhole(const std::string& path, Buffer& out) {
   close(fd);
 }
 
-// A workstation's kernel lacks the feature, so the question ends at the missing integrity file.
+// A workstation's kernel lacks the feature, so the request fails when the integrity file is
+// missing.
 void AskKernel(int /*fd*/) {
   LogInfo("VeltSignOat: Apk case.\n");
   FILE* const integrity = fopen("/proc/self/integrity/value", "r");

@@ -1,6 +1,6 @@
 // The steps that the floor and the peer share: all of the tool's job except the verification. Each
-// step is done once, and nothing is kept that is not needed. Both programs only ever read the good
-// packages of bench_packages, and exit if anything fails.
+// step is done once, and only needed data is kept. Both programs read only the good packages that
+// bench_packages makes, and exit if anything fails.
 #pragma once
 
 #include <cstdint>
@@ -38,8 +38,8 @@ std::string SignatureFileName(const GivenPackage& package);
 // Returns the package's name from the compiled manifest.
 std::string WalkManifest(const Buffer& compiled_manifest);
 
-// Reads each whole library beside the package, calls `check` with its entry's name and its bytes,
-// and then asks the kernel to sign it, as the tool would.
+// Does three things for each library beside the package, as the tool would: reads the whole file,
+// calls `check` with the entry's name and the file's bytes, and asks the kernel to sign the file.
 using CheckLibrary = std::function<void(const std::string& name, const Buffer& content)>;
 void SignLibraries(const GivenPackage& package, const CheckLibrary& check);
 void SignGiven(const GivenPackage& package);

@@ -70,7 +70,7 @@ BENCHMARK(ModMpi)->Name("mpi_mod_mpi")->Arg(1024)->Arg(2048)->Arg(4096);
 
 const Bytes kSigned(1000, 'x');
 
-// A public operation. Each iteration loads the key from its bytes. The time for that is included.
+// Measures the tool's public operation of RSA. The time to load the key from its bytes is included.
 void Tool(benchmark::State& state) {
   const Bytes modulus = ModulusOf(KeyOf(state));
   const Bytes signature = SignWith(KeyOf(state), Digest::kSha256, kSigned);

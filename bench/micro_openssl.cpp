@@ -1,5 +1,5 @@
-// The RSA public operation of the host's OpenSSL. It is a separate program, because bench_micro
-// links the platform's libcrypto, whose functions have the same names.
+// Measures the RSA public operation of the host's OpenSSL. This is a separate program, because
+// bench_micro links the platform's libcrypto, whose functions have the same names.
 #include <benchmark/benchmark.h>
 #include <openssl/bn.h>
 #include <openssl/core_names.h>
@@ -39,7 +39,7 @@ SignedMessage SignWithNewKey(unsigned bits) {
   return message;
 }
 
-// Each iteration loads the key from its bytes into a new RSA object. The time for that is included.
+// The time to load the key from its bytes into a new RSA object is included.
 void OpenSsl(benchmark::State& state) {
   const SignedMessage message = SignWithNewKey(static_cast<unsigned>(state.range(0)));
   for (auto _ : state) {

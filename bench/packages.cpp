@@ -1,8 +1,8 @@
 // bench_packages DIRECTORY: makes the packages that the benchmarks measure. Each is
 // DIRECTORY/<name>/base.apk with its libraries extracted beside it, as an installer leaves them.
 //
-// The contents come from the machine: its own libraries and the files of /usr/share. Zeros or
-// random bytes would not take the same time to inflate as a real package.
+// The contents are copied from the machine's own libraries and from the files of /usr/share. Zeros
+// or random bytes would not inflate at the same speed as the contents of a real package.
 #include <algorithm>
 #include <cstdio>
 #include <filesystem>
@@ -25,7 +25,7 @@ struct Plan {
   size_t dex_size;
   size_t entry_size;  // of each other entry
   const char* key = "rsa-2048";
-  bool in_order = true;  // entry names sorted, as apksigner lists them; else as jarsigner does
+  bool in_order = true;  // sorted by name, as apksigner lists entries; else not, as jarsigner
 };
 
 constexpr size_t kKilo = 1000, kMega = 1000 * kKilo;
@@ -42,7 +42,8 @@ constexpr Plan kPlans[] = {
     {"entries-60k-unordered", 60000, 0, 0, 20 * kKilo, 40, "rsa-2048", false},
 };
 
-// Delivers the bytes of all large files below a directory, one after the other, again and again.
+// Returns the bytes of all files of at least `least_size` bytes below a directory, one file after
+// the other. After the last file it continues with the first.
 class CircleOfFiles {
  public:
   CircleOfFiles(const std::string& directory, size_t least_size);
@@ -138,7 +139,7 @@ std::string EntryName(size_t index) {
   return kDirectories[index % 5] + std::string("entry_") + std::to_string(index) + ".bin";
 }
 
-// Makes the signature file list the digests of the manifest's sections, as signing tools do.
+// Adds the digests of the manifest's sections to the signature file, as signing tools do.
 void DescribeEntries(PackageOptions& options, std::string& manifest) {
   options.edit_manifest = [&](const std::string& text) { return manifest = text; };
   options.edit_signature_file = [&](const std::string& text) {

@@ -1,5 +1,5 @@
-// bench_peer FILE: does the tool's job with OpenSSL: its PKCS#7, X.509 and digests, and a hash
-// table of the manifest's entries.
+// bench_peer FILE: does the tool's job with OpenSSL. It uses OpenSSL's PKCS#7, X.509 and digests,
+// and a hash table of the manifest's entries.
 #include <openssl/evp.h>
 #include <openssl/pkcs7.h>
 #include <openssl/rsa.h>

@@ -19,8 +19,8 @@ MICRO = [f'{BUILD}/bench/bench_micro', f'{BUILD}/bench/bench_micro_openssl']
 DOCUMENT = 'docs/performance.md'
 
 # rounds: how often each program runs. floor, peer: the greatest allowed ratio of the tool's time to
-# theirs. memory: the greatest allowed ratio of the tool's memory to the floor's. None: no target.
-# margin: the part by which each ratio may exceed its target.
+# that program's time. memory: the greatest allowed ratio of the tool's memory to the floor's. None:
+# no target. margin: the fraction of the target by which each ratio may exceed it.
 Package = collections.namedtuple('Package', 'name rounds floor peer memory margin')
 PACKAGES = [
     Package('small', 101, 1.07, 0.90, 1.03, 0.05),

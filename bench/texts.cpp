@@ -4,7 +4,7 @@
 //   READER <TAB> NAME <TAB> peak bytes for each byte of the text <TAB> nanoseconds for each byte
 //
 // The peak includes the text itself, which is one byte for each byte. Each text is read in a
-// process of its own, because the peak of a process never falls.
+// separate process, so that memory that an earlier text left behind does not count.
 #include <sys/wait.h>
 #include <unistd.h>
 
@@ -25,7 +25,7 @@ namespace {
 
 constexpr size_t kTextSize = 64 << 20;
 
-// Appends pieces, each made from its number, until the text is long enough.
+// Appends pieces until the text is long enough. `make_piece` makes a piece from its number.
 template <typename MakePiece>
 std::vector<uint8_t> Repeat(const MakePiece& make_piece) {
   std::vector<uint8_t> text;
@@ -39,7 +39,7 @@ std::vector<uint8_t> Repeat(const MakePiece& make_piece) {
   return text;
 }
 
-// The shortest possible names, not sorted.
+// Returns one of the shortest possible names. The names of consecutive numbers are not sorted.
 std::string ShortName(size_t i) {
   std::string name;
   for (size_t rest = i * 2654435761U % (1U << 28); rest > 0; rest /= 64) {
@@ -79,7 +79,7 @@ constexpr Text kTexts[] = {
     {"one name without end", [] { return Repeat([](size_t) { return "A"; }); }},
 };
 
-// Counts and lengths whose documents deflate to a thousandth of their size.
+// With these numbers, documents deflate to a thousandth of their size.
 constexpr size_t kManyNodes = 1 << 20;
 constexpr size_t kLongName = 30000;
 
@@ -132,7 +132,7 @@ long PeakKilobytes() {
   return 0;
 }
 
-// Leaves out the memory that it took to make the text.
+// Resets the peak, so that the memory that was used to make the text does not count.
 void ResetPeak() { std::ofstream("/proc/self/clear_refs") << "5"; }
 
 void Measure(const Reader& reader, const Text& text) {

@@ -1,10 +1,11 @@
 // apktoolkit-all DIRECTORY LIST: signs every installed package after an update of the system. The
-// file LIST has a line "DIGEST[,DIGEST]... PATH" for each package, with its signers as the package
-// manager knows them (SignerDigests.java). DIRECTORY contains the programs: /system/bin. The
-// outcome for each package is printed.
+// file LIST has a line "DIGEST[,DIGEST]... PATH" for each package. The digests name the signers
+// that the package manager knows (SignerDigests.java). DIRECTORY contains the programs, for example
+// /system/bin. The program prints the outcome for each package.
 //
 // Files that the kernel already trusts are left out, so an interrupted run can be started again.
-// Exit status: 0 all are trusted, 1 some are not, 2 the command line or the list is wrong.
+// Exit status: 0 if all packages are trusted, 1 if some are not, 2 if the command line or the list
+// is wrong.
 #include <algorithm>
 #include <cerrno>
 #include <cstdio>
@@ -20,7 +21,7 @@ constexpr int kAllTrusted = 0;
 constexpr int kNotAllTrusted = 1;
 constexpr int kWrongInput = 2;
 
-// Reads the next line without its end. Returns false at the end of the file.
+// Reads the next line without its line end. Returns false at the end of the file.
 bool ReadLine(FILE* list, std::string* line) {
   char* text = nullptr;
   size_t size = 0;

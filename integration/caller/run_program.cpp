@@ -15,8 +15,8 @@ namespace {
 // The exit status of a child that could not exec the program. The kit's programs use lower numbers.
 constexpr int kCannotBecome = 127;
 
-// Everything that the child needs, made before the fork. The child of a process with several
-// threads must not take a lock, so it must not allocate.
+// Everything that the child needs. It is made before the fork: the child of a process with several
+// threads must not wait for a lock, so it must not allocate memory.
 struct Child {
   std::vector<char*> arguments;  // ends with a null pointer
   int null;                      // /dev/null, behind the standard streams
@@ -57,8 +57,9 @@ std::vector<char*> Arguments(const std::vector<std::string>& command) {
   return arguments;
 }
 
-// Opens /dev/null above the standard streams, even if this process has none. dup2 onto the same
-// number would keep close-on-exec, and exec would close that stream.
+// Opens /dev/null with a number above the standard streams, even if this process has no standard
+// streams. If the number were that of a stream, dup2 would do nothing, and exec would close the
+// stream.
 int OpenNull() {
   const int first = open("/dev/null", O_RDWR | O_CLOEXEC);
   if (first < 0) return first;
@@ -109,7 +110,7 @@ RunResult Describe(int status) {
   return {RunEnd::kExited, WEXITSTATUS(status)};
 }
 
-// The milliseconds of a clock that nobody can set.
+// Returns the milliseconds of a clock that cannot be set.
 long long Now() {
   timespec now = {};
   clock_gettime(CLOCK_MONOTONIC, &now);

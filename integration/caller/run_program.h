@@ -1,6 +1,6 @@
-// Runs a program of another level of trust, with limits of time and memory and without access to
-// this process's state. Plain POSIX, to be copied into the daemon that installs. Keeps no state,
-// logs nothing; any thread may call.
+// Runs a program with limits of time and memory, and without access to this process's state. The
+// code uses only POSIX, so that it can be copied into the daemon that installs packages. It keeps
+// no state and logs nothing, and any thread may call it.
 #pragma once
 
 #include <cstddef>
@@ -13,13 +13,13 @@
 #endif
 
 struct RunLimits {
-  // The program is killed after this time. A package of 100 MB takes a phone some seconds. A kernel
-  // whose integrity value never settles keeps the tool waiting for ever.
-  // integrity value does not settle keeps the tool waiting for ever.
+  // The program is killed after this time. A package of 100 MB takes a phone some seconds. The tool
+  // waits forever on a kernel whose integrity value never settles.
   int milliseconds = 120000;
-  // The memory that the program may write to (RLIMIT_DATA); 0: as much as this process. The tool
-  // needs up to 16 bytes for each byte of the file and of its entries' contents, and aborts without
-  // them. Not RLIMIT_AS: allocators of newer releases reserve far more addresses than they use.
+  // The limit of the memory that the program can write to (RLIMIT_DATA); 0: this process's limit.
+  // The tool needs up to 16 bytes for each byte of the file and of its entries' contents, and
+  // aborts if it cannot get them. RLIMIT_AS is not used, because allocators of newer releases
+  // reserve far more addresses than they use.
   size_t memory_bytes = APKTOOLKIT_MEMORY_LIMIT;
 };
 
@@ -28,7 +28,7 @@ enum class RunEnd {
   kKilled,      // by the signal `value`; without memory the tool ends by SIGABRT
   kTimedOut,    // and then killed
   kNotStarted,  // `value` is the errno, or 0 if the child could not exec the program
-  kLost,        // another thread of this process waited for it
+  kLost,        // another thread of this process waited for the child
 };
 
 struct RunResult {
@@ -36,8 +36,8 @@ struct RunResult {
   int value;
 };
 
-// Runs `command`, a program's path and its arguments, and waits for its end, or kills it at the
-// limit. The program gets /dev/null for its three standard streams, no other descriptor of this
-// process and no blocked signal. It keeps this process's environment and working directory. Hold no
-// lock meanwhile. SIGCHLD must not be ignored in this process.
+// Runs `command`, a program's path and its arguments. Waits until the program ends, and kills it at
+// the time limit. The program gets /dev/null for its three standard streams, and no other
+// descriptor of this process. No signal is blocked in it. It keeps this process's environment and
+// working directory. The caller must not hold a lock during the call, and must not ignore SIGCHLD.
 RunResult RunProgram(const std::vector<std::string>& command, const RunLimits& limits);

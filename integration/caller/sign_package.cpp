@@ -48,7 +48,7 @@ SignOutcome SignPackage(const std::string& directory, const InstalledPackage& pa
   const RunResult run = RunProgram({directory + "/apktoolkit-bound", package.signer_digests,
                                     directory + "/apktoolkit", package.path},
                                    limits);
-  // The tool's exit status tells nothing about the file. Only the kernel knows.
+  // The tool's exit status does not show whether the file was signed. Only the kernel knows.
   if (IsTrusted(directory, package.path, limits)) return SignOutcome::kTrusted;
   return WhyNotTrusted(run);
 }

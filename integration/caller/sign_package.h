@@ -1,11 +1,11 @@
-// Signs an installed package, as an installer does: checks the signers, runs apktoolkit, asks the
-// kernel. Keeps no state, logs nothing; any thread may call.
+// Signs an installed package, as an installer does: checks the signers, runs apktoolkit, and asks
+// the kernel for the result. The code keeps no state and logs nothing, and any thread may call it.
 //
-// Call it during an install after the package has its final path and its native libraries lie
-// beside it, and before any of its code is run, mapped, or compiled ahead of time (dexopt). From
-// then on nobody may write to the package or beside it. Hold no lock over the call: it may take as
-// long as the limits allow. An update of the system may bring another key. Then call it for every
-// installed package (main.cpp).
+// Call SignPackage during an install when the package has its final path and its native libraries
+// are beside it. It must be called before any code of the package is run, mapped, or compiled ahead
+// of time (dexopt). From the call on, nobody may write to the package or beside it. The caller must
+// not hold a lock: the call may take as long as the limits allow. After an update of the system,
+// which may bring another key, call it for every installed package (main.cpp).
 #pragma once
 
 #include <string>
@@ -32,9 +32,9 @@ enum class SignOutcome {
 // Runs the programs apktoolkit-verify, apktoolkit-bound and apktoolkit in `directory`
 // ("/system/bin").
 //
-// The product decides how to react. It treats an untrusted package like any other without a
-// payload. After kTimedOut and kOutOfMemory the libraries may be signed, but the package itself is
-// not, since it comes last. Do not try again at once: the same file takes the same time.
+// The product decides how to react. It should treat an untrusted package like any other without a
+// payload. After kTimedOut and kOutOfMemory the libraries may be signed. The package itself is not,
+// because it is signed last. Do not try again at once: the same file takes the same time.
 SignOutcome SignPackage(const std::string& directory, const InstalledPackage& package,
                         const RunLimits& limits);
 

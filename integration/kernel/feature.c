@@ -1,12 +1,12 @@
 // SPDX-License-Identifier: GPL-2.0-only OR Apache-2.0
 /*
- * The file-integrity feature on an ordinary kernel, for tests alone: the smallest form that
- * apktoolkit works with. NOT for a product: every task may have every file signed, and a parameter
- * sets the integrity value of every task (README.md tells what a product needs).
+ * The file-integrity feature on an ordinary kernel, only for tests. It is the smallest feature that
+ * apktoolkit works with. It is NOT for a product: every task may have every file signed, and a
+ * parameter sets the integrity value of every task (docs/porting.md explains what a product needs).
  *
  *   fcntl(fd, 1124, payload)   signs: keeps the payload, and the SHA-256 digest of the file's
  *                              bytes, in an extended attribute of the file
- *   fcntl(fd, 1125)            verifies: 0 as long as the file has the bytes that were signed
+ *   fcntl(fd, 1125)            verifies: returns 0 if the file has the bytes that were signed
  *   /proc/PID/integrity/value  the integrity value of a task, in hexadecimal
  *
  * The kernel itself is not changed. Kprobes redirect these two commands, and the look-up of
@@ -64,7 +64,7 @@ struct signature {
 	u8 data[];
 } __packed;
 
-/* The caller frees the result. No byte is read twice, because the task may change it meanwhile. */
+/* The caller frees the result. Each byte is read only once, because the task may change it. */
 static struct signature *copy_payload(const u8 __user *payload)
 {
 	struct signature *signature;
@@ -82,7 +82,7 @@ static struct signature *copy_payload(const u8 __user *payload)
 	return ERR_PTR(-EFAULT);
 }
 
-/* A product fixes the bytes. Here they may change between the digest and their use. */
+/* A product must fix the file's bytes. Here they may change after the digest is computed. */
 static int digest_file(struct file *file, u8 digest[SHA256_DIGEST_SIZE])
 {
 	struct sha256_state state;
@@ -192,7 +192,7 @@ static asmlinkage long integrity_fcntl(struct pt_regs *call)
 
 /* ---- /proc/PID/integrity/value */
 
-/* Takes the first text off the list, unless it is the last one. The caller frees the result. */
+/* Returns the first text of the list, and removes it if there is another. The caller frees it. */
 static char *take_text(void)
 {
 	char *text, *comma;
@@ -246,7 +246,7 @@ static const struct file_operations value_operations = {
 	.release = value_release,
 };
 
-/* The caller passes the inode on. */
+/* The caller must pass the inode on, or release it. */
 static struct inode *new_node(struct inode *directory, umode_t mode)
 {
 	struct inode *inode = new_inode(directory->i_sb);
@@ -286,7 +286,7 @@ static struct dentry *look_up_integrity(struct inode *directory, struct dentry *
 	return d_splice_alias(inode, dentry); /* or the inode's error */
 }
 
-/* ---- The two kernel functions that are entered. Each call continues in a function above instead. */
+/* ---- The handlers of the two probes. They redirect a kernel function to a function above. */
 
 static int fcntl_entered(struct kprobe *probe, struct pt_regs *registers)
 {

@@ -37,7 +37,7 @@ static __printf(1, 2) void write_line(const char *format, ...)
 	kfree(line);
 }
 
-/* The path is not escaped: paths of the tests need no escapes. */
+/* The path is not escaped, because the paths of the tests need no escapes. */
 static void write_answer(const char *event, int fd, struct file *file, const char *payload,
 			 int error)
 {
@@ -71,7 +71,7 @@ void journal_integrity(struct file *value, const char *text)
 	const char *quote = text ? "\"" : "";
 	int pid = 0;
 
-	/* As in the simulator's journal, 0 stands for the reading task itself, by either name. */
+	/* As in the simulator's journal, 0 is the reading task itself: /proc/self or its own number. */
 	if (kstrtoint(task, 10, &pid) || pid == task_tgid_vnr(current))
 		pid = 0;
 	write_line("{\"event\":\"integrity\",\"pid\":%d,\"text\":%s%s%s}\n", pid, quote,

@@ -1,7 +1,7 @@
 /* SPDX-License-Identifier: GPL-2.0-only OR Apache-2.0 */
 /*
- * Writes each question to the module and its answer as a line of the journal (docs/journal.md)
- * to the file that the parameter `journal` names. Without the parameter nothing is written.
+ * Writes each call to the module and its result as a line of the journal (docs/journal.md), to the
+ * file that the parameter `journal` names. Without the parameter nothing is written.
  */
 #include <linux/types.h>
 
@@ -10,10 +10,10 @@ struct file;
 /* Opens the file for appending. Returns 0 or a negative error number. */
 int journal_open(void);
 
-/* file: the file that is open as fd, or NULL; payload: its bytes from the length on, none if it
- * could not be read; error: 0 or negative. */
+/* file: the file that is open as fd, or NULL. payload: `size` bytes, which begin with the payload's
+ * length; none if the payload could not be read. error: 0 or a negative error number. */
 void journal_sign(int fd, struct file *file, const void *payload, size_t size, int error);
 void journal_verify(int fd, struct file *file, int error);
 
-/* value: the task's file that is opened; text: its contents, or NULL if it is missing. */
+/* value: the integrity file that is opened. text: its contents, or NULL if there is no file. */
 void journal_integrity(struct file *value, const char *text);

@@ -1,6 +1,6 @@
 # For a product's makefile:
 #   $(call inherit-product, external/apktoolkit/integration/phone/apktoolkit.mk)
-# This brings libzu, too: the product's own or the stub (docs/porting.md).
+# This also installs libzu: the product's own library or the stub (docs/porting.md).
 PRODUCT_PACKAGES += \
     apktoolkit \
     apktoolkit-all \

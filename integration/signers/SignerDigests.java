@@ -15,21 +15,22 @@ import java.util.LinkedHashSet;
 import java.util.Set;
 
 /**
- * The package manager's side of binding the signers: names a package's signers in the form in which
- * apktoolkit names a signer to the kernel. Use it in the process that installs.
+ * The package manager's side of binding the signers. It names each signer of a package by the same
+ * digest that apktoolkit passes to the kernel. Use this class in the process that installs
+ * packages.
  *
- * <p>The package manager uses the newest signing block that it knows, apktoolkit the JAR signature.
- * Pass a package to apktoolkit only if its JAR signer is one of these signers: run apktoolkit-bound,
- * or call {@link #isAmong}.
+ * <p>The package manager uses the newest signing block that it knows. apktoolkit uses the JAR
+ * signature. Pass a package to apktoolkit only if its JAR signer is one of the package manager's
+ * signers. To check this, run apktoolkit-bound, or call {@link #isAmong}.
  */
 public final class SignerDigests {
     private SignerDigests() {}
 
     /**
-     * The signers of an installed package from API level 28 on
-     * ({@code PackageManager.GET_SIGNING_CERTIFICATES}): those of its present content. If the key was
-     * rotated, earlier keys are left out on purpose. A retired key may be in other hands, and a
-     * payload names the key and not the package.
+     * Returns the digests of the present signers of an installed package, from API level 28 on
+     * ({@code PackageManager.GET_SIGNING_CERTIFICATES}). If the key was rotated, earlier keys are
+     * left out on purpose. Somebody else may have a retired key, and a payload names only the key,
+     * not the package.
      */
     public static String of(SigningInfo info) throws CertificateException {
         return of(info.getApkContentsSigners());
@@ -38,9 +39,9 @@ public final class SignerDigests {
     /**
      * The same for API level 27 ({@code PackageInfo.signatures}, {@code PackageManager.GET_SIGNATURES}).
      *
-     * @return the SHA-256 digest of each signer's RSA modulus, in lower-case hexadecimal, with commas
-     *     between. Keys of other kinds have no digest: apktoolkit does not accept their signatures.
-     *     Empty if no signer has an RSA key.
+     * @return the SHA-256 digest of each signer's RSA modulus, in lower-case hexadecimal, separated
+     *     by commas. Other kinds of key are left out, because apktoolkit does not accept their
+     *     signatures. The text is empty if no signer has an RSA key.
      */
     public static String of(Signature[] signers) throws CertificateException {
         CertificateFactory factory = CertificateFactory.getInstance("X.509");
@@ -56,12 +57,12 @@ public final class SignerDigests {
         return String.join(",", digests);
     }
 
-    /** True if the JAR signer is one of the signers; {@code digests} is the result of {@link #of}. */
+    /** Returns true if {@code digests}, a result of {@link #of}, contains {@code jarSigner}. */
     public static boolean isAmong(String digests, String jarSigner) {
         return !jarSigner.isEmpty() && Arrays.asList(digests.split(",")).contains(jarSigner);
     }
 
-    /** The digest as in a payload: of the modulus's bytes, highest first, without leading zeros. */
+    /** The digest of a payload: over the modulus's bytes, highest first, without leading zeros. */
     private static String digestOf(BigInteger modulus) {
         byte[] bytes = modulus.toByteArray();
         int sign = bytes[0] == 0 ? 1 : 0;

@@ -1,12 +1,13 @@
-// apktoolkit-bound DIGESTS COMMAND... FILE: runs `COMMAND... FILE` if the package manager knows the
-// JAR signer of the package FILE. Otherwise it ends with an exit status of its own.
+// apktoolkit-bound DIGESTS COMMAND... FILE: runs `COMMAND... FILE` if the JAR signer of the package
+// FILE is one of the package manager's signers. Otherwise it ends with one of its own exit
+// statuses.
 //
-// The package manager uses the newer signing block and apktoolkit the JAR signature. Nobody else
-// compares the two (docs/threat-model.md, "Before you ship it"). DIGESTS comes from
+// The package manager uses the newer signing block. apktoolkit uses the JAR signature. No other
+// program compares the two (docs/threat-model.md, "Before you ship it"). DIGESTS comes from
 // SignerDigests.java: the SHA-256 digest of the RSA modulus of each of the package manager's
-// signers, in lower-case hexadecimal, with commas between. The tool's own code finds the JAR's
-// signer, so that both mean the same one. Each package is read in a child process, because the
-// tool's code ends the process if memory runs out, and does not free everything.
+// signers, in lower-case hexadecimal, separated by commas. This program finds the JAR signer with
+// the tool's own code, so it finds the same signer as the tool. It is a separate program because
+// that code ends the process if memory runs out, and does not free all of its memory.
 #include <fcntl.h>
 #include <unistd.h>
 
@@ -24,14 +25,14 @@
 
 namespace {
 
-// The command's own statuses, apktoolkit's 0 and 1, are left free.
+// The statuses 0 and 1 are those of the command, apktoolkit.
 constexpr int kUsageError = 2;
 constexpr int kOtherSigner = 3;
 constexpr int kNoJarSigner = 4;
 constexpr int kNotStarted = 5;
 
-// Returns the digest of the signer's key if that key's signatures over the signature file and over
-// its own certificate are good, and otherwise an empty text. The tool makes its payload of the same
+// Returns the digest of the signer's key, or an empty text if the key's signature over the
+// signature file or over its own certificate is not good. The tool makes its payload from the same
 // digest.
 std::string JarSigner(const char* file) {
   const ScopedFd fd(OpenForReading(file, O_CLOEXEC));
