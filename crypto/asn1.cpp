@@ -38,7 +38,7 @@ int asn1_get_next_bounded(const uint8_t* buf, size_t available, size_t bound, as
   if (!ReadIdentifier(&octets, hdr) || !ReadLength(&octets, hdr)) return -1;
 
   const size_t header_length = readable - octets.left;
-  // Deliberate: lengths have 32 bits here, and so does the remaining length.
+  // Deliberate: the remaining length is cut to 32 bits, because every length here has 32 bits.
   const auto remaining = static_cast<uint32_t>(bound - header_length);
   if (hdr->length > remaining) return -1;
   hdr->payload = octets.position;
@@ -79,14 +79,14 @@ void asn1_oid_to_str(const asn1_oid* oid, char* buf, size_t size) {
   size_t used = 0;
   for (size_t i = 0; i < oid->len; ++i) {
     const int length = snprintf(buf + used, size - used, "%s%u", i == 0 ? "" : ".", oid->oid[i]);
-    // No test can make `length` negative: nothing in this format can fail.
+    // No test can make `length` negative: snprintf cannot fail with this format.
     if (length < 0 || static_cast<size_t>(length) >= size - used) break;
     used += static_cast<size_t>(length);
   }
   buf[size - 1] = '\0';
 }
 
-// Deliberate: the count of unused bits is ignored, so those bits count as bits of the string.
+// Deliberate: the count of unused bits is ignored, so the unused bits are read like all others.
 uint64_t asn1_bit_string_to_long(const uint8_t* buf, size_t len) {
   constexpr size_t kMaxOctets = 5;  // the count of unused bits, and 32 bits
   uint64_t value = 0;
@@ -124,9 +124,9 @@ bool ReadLength(Octets* octets, asn1_hdr* hdr) {
     hdr->length = octet;
     return true;
   }
-  // 0xFF, which is reserved, fails because its count is too large. Deliberate: there may be more
-  // octets than DER allows. The indefinite form, whose count is 0, reads as empty contents; nobody
-  // looks for the end of its element.
+  // The reserved octet 0xFF fails because its count is too large. Deliberate: the length may have
+  // more octets than DER allows. The indefinite form has the count 0 and reads as empty contents.
+  // Its end-of-contents octets are not searched for.
   const uint32_t count = octet & 0x7f;
   if (count > kMaxLengthOctets) return false;
   for (uint32_t i = 0; i < count; ++i) {

@@ -1,6 +1,7 @@
-// Reads DER, and BER that is close to it, one header at a time (X.690 §8.1). The caller interprets
-// the values. The functions neither allocate nor log. Records point into the caller's bytes, which
-// must outlive them. Every function that can fail returns 0 for success and -1 for failure.
+// Reads DER one header at a time (X.690 §8.1). Accepts some encodings that only BER allows. The
+// caller interprets the values. The functions neither allocate nor log. Records point into the
+// caller's bytes. These bytes must outlive the records. Every function that can fail returns 0 for
+// success and -1 for failure.
 #pragma once
 
 #include <cstddef>
@@ -24,7 +25,7 @@ inline constexpr uint32_t kAsn1GeneralizedTime = 24;
 // One header, decoded.
 struct asn1_hdr {
   const uint8_t* payload;  // first byte of the contents; null when the header could not be read
-  uint8_t identifier;      // the first identifier octet, as it is
+  uint8_t identifier;      // the first identifier octet, unchanged
   uint8_t class_;          // its bits 8 and 7
   uint8_t constructed;     // its bit 6
   uint32_t tag;            // its low five bits, or the long form's number
@@ -40,26 +41,27 @@ struct asn1_oid {
 };
 
 // Reads the header at the start of the `len` bytes at `buf` into `hdr`. The element must end within
-// those bytes. Identifier and length octets need not be minimal. A long tag number keeps its low 32
-// bits. The indefinite form reads as length 0. More than four length octets fail, and so does the
-// reserved first length octet 0xFF.
+// those bytes. Identifier and length octets need not be minimal. The low 32 bits of a long tag
+// number are kept. The indefinite form reads as length 0. Fails for more than four length octets,
+// and for the reserved first length octet 0xFF.
 //
-// After a failure, `hdr` holds the fields that were decoded before it, and its payload is null.
+// After a failure, `hdr` contains the fields that were decoded before the failure. Its payload is
+// null.
 int asn1_get_next(const uint8_t* buf, size_t len, asn1_hdr* hdr);
 
-// The same, for callers that trust an outer length: the element must end within `bound` bytes at
-// `buf`, although only `available` of them can be read. The header's own octets must lie within
-// both. The contents may end beyond `available`; the caller must not read further than that.
+// Like asn1_get_next, for callers that trust an outer length. The element must end within `bound`
+// bytes from `buf`. The header must end within both `bound` and `available` bytes. The contents may
+// end beyond the `available` bytes. The caller must not read beyond these bytes.
 int asn1_get_next_bounded(const uint8_t* buf, size_t available, size_t bound, asn1_hdr* hdr);
 
-// Decodes the contents of an OBJECT IDENTIFIER (X.690 §8.19), `len` bytes at `buf`; no bytes give
-// no arcs. Each arc keeps its low 32 bits. Contents that end within an arc fail, and so does a 21st
-// arc; `oid` then holds the arcs before the fault.
+// Decodes the `len` bytes at `buf`, the contents of an OBJECT IDENTIFIER (X.690 §8.19). Empty
+// contents have no arcs. The low 32 bits of each arc are kept. Fails for contents that end within
+// an arc, and for a 21st arc. `oid` then contains the arcs before the fault.
 int asn1_parse_oid(const uint8_t* buf, size_t len, asn1_oid* oid);
 
-// Reads a whole OBJECT IDENTIFIER element from the `len` bytes at `buf`. Sets `next` to the
-// position after the element once its header is right. Fails for any other element, and for empty
-// contents.
+// Reads a whole OBJECT IDENTIFIER element from the `len` bytes at `buf`. If the header is correct,
+// sets `next` to the position after the element, even if the contents are malformed. Fails for any
+// other element, and for empty contents.
 int asn1_get_oid(const uint8_t* buf, size_t len, asn1_oid* oid, const uint8_t** next);
 
 // Writes the arcs as dotted text into the `size` bytes at `buf`. The text is cut to fit and ends
@@ -68,7 +70,7 @@ int asn1_get_oid(const uint8_t* buf, size_t len, asn1_oid* oid, const uint8_t** 
 // library.
 void asn1_oid_to_str(const asn1_oid* oid, char* buf, size_t size);
 
-// The named bits of a BIT STRING (X.690 §8.6) as an integer. `buf` holds the contents. Their first
-// byte is the count of unused bits, which is ignored. Named bit n becomes bit n of the result; bits
-// 32 and above are dropped. Contents of fewer than two bytes give 0.
+// Returns the named bits of a BIT STRING (X.690 §8.6) as an integer. The contents are the `len`
+// bytes at `buf`. Their first byte, the count of unused bits, is ignored. Named bit n becomes bit n
+// of the result; bits 32 and above are dropped. Returns 0 for contents of fewer than two bytes.
 uint64_t asn1_bit_string_to_long(const uint8_t* buf, size_t len);

@@ -9,10 +9,11 @@
 
 #include "crypto/wrapping.h"
 
-// Deliberate: limbs have 32 bits, and no sum or product of limbs has more, even on 64-bit
-// processors. There is one way to compute, in half limbs, and it needs no double-width type of the
-// compiler. The device's object code has no wider multiplication either (scripts/check android
-// looks for one). Other compilers may use one for a vector of half limbs, as gcc does for x86-64.
+// Deliberate: limbs have 32 bits, and every sum and product of limbs is computed in 32 bits, even
+// on 64-bit processors. All processors compute in the same way, in half limbs, and the compiler
+// needs no double-width type. The object code for the device has no wider multiplication either
+// (scripts/check android checks this). Other compilers may use a wider multiplication for a vector
+// of half limbs, as gcc does for x86-64.
 
 namespace {
 
@@ -179,8 +180,8 @@ int mpi_mul_int(mpi* X, const mpi* A, unsigned int b) {
   return 0;
 }
 
-// Nearly all the time of an exponentiation is spent here, so the loop is unrolled over 16 and over
-// 8 limbs, which saves 1 to 3 % of it.
+// An exponentiation spends nearly all of its time here. The loop is therefore unrolled over 16 and
+// over 8 limbs, which saves 1 to 3 % of that time.
 WRAPS_ON_PURPOSE void mpi_mul_hlp(int count, const unsigned int* s, unsigned int* d,
                                   unsigned int b) {
   uint32_t c = 0;
@@ -215,13 +216,13 @@ WRAPS_ON_PURPOSE void mpi_montmul(mpi* A, const mpi* B, const mpi* N, unsigned i
     const uint32_t u1 = (d[0] + u0 * B->p[0]) * mm;
     mpi_mul_hlp(m, B->p, d, u0);
     mpi_mul_hlp(n, N->p, d, u1);
-    // The two rows made this limb zero, so it can store another value.
+    // The two products made this limb of T zero, so it can store another value.
     *d++ = u0;
   }
   for (int i = 0; i <= n; ++i) A->p[i] = d[i];
 
-  // Deliberate: N is always subtracted, so that the time does not depend on the product. If the
-  // product is below N, scratch limbs that nobody reads take the subtraction. T holds the product
+  // Deliberate: n limbs are always subtracted, so that the time does not depend on the product. A
+  // product below N is subtracted from T, whose limbs are not read again. T contains the product
   // above its lowest n limbs, so T is not less than the product and absorbs the borrow.
   if (mpi_compare_abs(A, N) >= 0) {
     subtract_with_borrow(n, N->p, A->p);
@@ -235,9 +236,9 @@ namespace {
 // Wipes and frees the limbs of X. X still points at them afterwards.
 void release_limbs(mpi* X) {
   clear_limbs(X);
-  // A compiler may drop a store to memory that is about to be freed. The empty assembly counts as a
-  // read of these zeros and keeps them. No test can tell, because gcc 12 and clang 14 keep them
-  // anyway.
+  // A compiler may drop a store to memory that is about to be freed. The compiler must assume that
+  // the empty assembly reads these zeros, and so it stores them. No test can check this, because
+  // gcc 12 and clang 14 store them anyway.
   __asm__ __volatile__("" : : "r"(X->p) : "memory");
   free(X->p);
 }
@@ -253,7 +254,7 @@ int used_limbs(const mpi* X) {
   return used;
 }
 
-// -1, 0 or +1 as X is below, equal to or above zero.
+// Returns -1, 0 or +1 for X below, equal to or above zero.
 int sign_of(const mpi* X) { return used_limbs(X) == 0 ? 0 : X->s; }
 
 int compare_limbs(int count, const uint32_t* a, const uint32_t* b) {
@@ -289,15 +290,16 @@ WRAPS_ON_PURPOSE uint32_t subtract_limbs(int count, const uint32_t* s, uint32_t*
   return borrow;
 }
 
-// The same, but takes the borrow from the higher limbs of d, one of which must absorb it.
+// Like subtract_limbs, but then subtracts the borrow from the higher limbs of d. One of these limbs
+// must absorb the borrow.
 WRAPS_ON_PURPOSE void subtract_with_borrow(int count, const uint32_t* s, uint32_t* d) {
   uint32_t borrow = subtract_limbs(count, s, d);
   for (int i = count; borrow != 0; ++i) borrow = d[i]-- == 0;
 }
 
-// Adds s * b + c to d over `kCount` limbs; returns the carry. A vector holds one limb in each lane,
-// so each of the four half products is computed for all lanes at once. They are put together so
-// that no sum wraps: (2^16 - 1)^2, the greatest half product, leaves room for another half limb.
+// Adds s * b + c to d over `kCount` limbs; returns the carry. A vector has one limb in each lane,
+// so each of the four half products is computed for all lanes at once. Their sums do not wrap: the
+// greatest half product, (2^16 - 1)^2, plus two half limbs fits in 32 bits.
 template <int kCount>
 WRAPS_ON_PURPOSE uint32_t multiply_add(const uint32_t* s, uint32_t* d, uint32_t b, uint32_t c) {
   constexpr int kLanes = std::min(kCount, 4);
@@ -336,7 +338,8 @@ WRAPS_ON_PURPOSE int reduce(mpi* X, const mpi* B) {
   mpi_local Y;
   mpi_local product;
   if (const int result = mpi_assign(&Y, B)) return result;
-  // If the divisor's highest bit is set, the estimate of a digit is close and never too small.
+  // The estimate of a digit is close and never too small if the top limb of the divisor has its
+  // highest bit set.
   const int shift = (kMpiLimbBits - mpi_msb(&Y) % kMpiLimbBits) % kMpiLimbBits;
   if (const int result = mpi_shift_l(&Y, shift)) return result;
   if (const int result = mpi_shift_l(X, shift)) return result;
@@ -358,7 +361,8 @@ WRAPS_ON_PURPOSE int reduce(mpi* X, const mpi* B) {
   return 0;
 }
 
-// The digit of X / Y that belongs to limb i of X, or one more than it; t is the top limb of Y.
+// Returns the quotient digit of X / Y that belongs to limb i of X, or that digit plus one. t is the
+// index of Y's top limb.
 uint32_t quotient_digit(const mpi* X, int i, const mpi* Y, int t) {
   const uint32_t divisor[2] = {t >= 1 ? Y->p[t - 1] : 0, Y->p[t]};
   const uint32_t dividend[3] = {i >= 2 ? X->p[i - 2] : 0, X->p[i - 1], X->p[i]};
@@ -370,7 +374,8 @@ uint32_t quotient_digit(const mpi* X, int i, const mpi* Y, int t) {
   }
 }
 
-// The quotient of the two limbs by d, whose highest bit is set. At most UINT32_MAX is returned.
+// Returns the quotient of the two limbs by d, but at most UINT32_MAX. The highest bit of d must be
+// set.
 uint32_t estimate_digit(uint32_t high, uint32_t low, uint32_t d) {
   if (high >= d) return UINT32_MAX;
   uint32_t rest = high;

@@ -1,9 +1,9 @@
 // Multi-precision integers, just large enough for the RSA public operation.
 //
-// A number owns its limbs. They come from malloc and are overwritten with zeros before they are
-// freed or replaced. Arguments are never null. A number may be several arguments of one operation
-// if the operation's comment allows it. Operations that allocate return kMpiNoMemory if malloc
-// fails; their result is then in a valid state. Nothing here logs.
+// A number owns its limbs. The limbs are allocated by malloc, and overwritten with zeros before
+// they are freed or replaced. Arguments must not be null. The same number may be passed as several
+// arguments of an operation only if the operation's comment allows it. Operations that allocate
+// return kMpiNoMemory if malloc fails; their result is then in a valid state. Nothing here logs.
 #pragma once
 
 #include <cstddef>
@@ -34,7 +34,8 @@ void mpi_init(mpi* X, ...) __attribute__((sentinel));
 // allowed. The list ends with a null pointer.
 void mpi_free(mpi* X, ...) __attribute__((sentinel));
 
-// Calls mpi_init or mpi_free on the numbers of a record. Here the record is one number.
+// Calls mpi_init or mpi_free for all numbers of a record. In this overload, the record is a single
+// number.
 inline void mpi_apply(void (*call)(mpi* X, ...), mpi* X) { call(X, nullptr); }
 
 // A record whose numbers start empty and are released when its scope ends.
@@ -47,15 +48,15 @@ struct mpi_owner : Record {
 };
 using mpi_local = mpi_owner<mpi>;
 
-// Gives X at least `nblimbs` limbs; the new ones are zero. Never shrinks. On failure X is
+// Grows X to at least `nblimbs` limbs. New limbs are zero. Never shrinks X. On failure X is
 // unchanged.
 int mpi_grow(mpi* X, int nblimbs);
 
-// X = A. If X has more limbs than A, it keeps them as zeros.
+// X = A. If X has more limbs than A needs, X keeps these limbs and they become zero.
 int mpi_assign(mpi* X, const mpi* A);
 
-// X = the unsigned big-endian number in `len` bytes. An empty X gets only the limbs that the number
-// needs, and at least one. `bytes` may be null only if `len` is 0.
+// X = the unsigned big-endian number in the `len` bytes at `bytes`. An empty X gets only the limbs
+// that the number needs, and at least one. `bytes` may be null only if `len` is 0.
 int mpi_from_bytes(mpi* X, const uint8_t* bytes, size_t len);
 
 // Writes the magnitude of X as exactly `len` bytes, big-endian, with leading zero bytes. Returns
@@ -65,18 +66,19 @@ int mpi_to_bytes(const mpi* X, uint8_t* bytes, size_t len);
 // The bit length of the magnitude: one more than the index of the highest set bit, 0 for zero.
 int mpi_msb(const mpi* X);
 
-// Compares A with B, by magnitude and by value. Returns a number below, equal to or above 0 for A <
-// B, A = B and A > B. Two zeros are equal even if their signs differ.
+// mpi_compare_abs compares the magnitudes of A and B, and mpi_compare their values. Both return a
+// number below, equal to or above 0 for A < B, A = B and A > B. Two zeros are equal even if their
+// signs differ.
 int mpi_compare_abs(const mpi* A, const mpi* B);
 int mpi_compare(const mpi* A, const mpi* B);
 
-// Multiplies the magnitude of X by 2^count; the sign stays. X grows, if it must, to the bit length
-// of the product, or to `count` bits for a zero. A negative count changes nothing. Returns
+// Multiplies the magnitude of X by 2^count and keeps the sign. If needed, X grows to the bit length
+// of the product, or to `count` bits if X is zero. A negative count changes nothing. Returns
 // kMpiNoMemory, with X unchanged, if the bit length of the result does not fit in an int.
 int mpi_shift_l(mpi* X, int count);
 
-// X = abs(A) + abs(B), with sign +1. X may be A, B or both. Verification itself adds no two
-// numbers. This is the counterpart of mpi_sub_abs, and tests compare both with GMP.
+// X = abs(A) + abs(B), with sign +1. X may be A, B or both. Verification does not call this
+// function. It is the counterpart of mpi_sub_abs, and tests compare both functions with GMP.
 int mpi_add_abs(mpi* X, const mpi* A, const mpi* B);
 
 // X = abs(A) - abs(B), with sign +1. X may be A, B or both. Returns kMpiNegativeResult, with X
@@ -86,8 +88,8 @@ int mpi_sub_abs(mpi* X, const mpi* A, const mpi* B);
 // X = A * b, with the sign of A. X may be A.
 int mpi_mul_int(mpi* X, const mpi* A, unsigned int b);
 
-// Adds s * b to d, over `count` limbs of s. The caller makes sure that d has `count` limbs, and
-// above them the limbs that the carry reaches. `s` may be null if `count` is 0.
+// Adds s * b to d, over `count` limbs of s. d must have `count` limbs, and above these all limbs
+// that the carry reaches. `s` may be null if `count` is 0.
 void mpi_mul_hlp(int count, const unsigned int* s, unsigned int* d, unsigned int b);
 
 // R = A mod abs(B), 0 <= R < abs(B), with sign +1. R may be A or B. Returns kMpiDivisionByZero,
@@ -95,8 +97,8 @@ void mpi_mul_hlp(int count, const unsigned int* s, unsigned int* d, unsigned int
 int mpi_mod_mpi(mpi* R, const mpi* A, const mpi* B);
 
 // A = A * B / 2^(32 * N.n) mod N, for A and B below N. Signs are neither read nor changed. A may be
-// B. N is odd, and `mm` is -1 / N mod 2^32. T is scratch; its former value does not matter. A has
-// at least N.n + 1 limbs, B at least one, T at least 2 * (N.n + 1).
+// B. N must be odd, and `mm` must be -1 / N mod 2^32. T is scratch space, and its old value does
+// not matter. A must have at least N.n + 1 limbs, B at least one, and T at least 2 * (N.n + 1).
 void mpi_montmul(mpi* A, const mpi* B, const mpi* N, unsigned int mm, mpi* T);
 
 // X = A^abs(E) mod N, for A >= 0 and N of fewer than 2^25 limbs. X may be A, but neither E nor N.

@@ -4,7 +4,7 @@
 
 namespace {
 
-// The size of an exponentiation's window table; its index has up to 6 bits.
+// The number of entries in an exponentiation's window table. An index has at most 6 bits.
 constexpr int kWindowTableSize = 64;
 
 // The values that all Montgomery products of one exponentiation share.
@@ -13,7 +13,7 @@ struct montgomery {
   uint32_t mm;
   mpi_local T;
 
-  // Sets X = A, and gives X enough limbs for a Montgomery product.
+  // Sets X = A. X then has enough limbs for a Montgomery product.
   int copy(mpi* X, const mpi* A) const;
   void multiply(mpi* A, const mpi* B) { mpi_montmul(A, B, N, mm, &T); }
 };
@@ -35,8 +35,8 @@ int mpi_pow_mod(mpi* X, const mpi* A, const mpi* E, const mpi* N) {
   if (const int result = mpi_grow(&m.T, 2 * (N->n + 1))) return result;
   if (const int result = mpi_grow(&one, 1)) return result;
   one.p[0] = 1;
-  // A product with R^2 mod N, R = 2^(32 * N.n), takes a number into Montgomery form. A product with
-  // 1 takes it out again.
+  // R is 2^(32 * N.n). A Montgomery product with R^2 mod N converts a number into Montgomery form.
+  // A Montgomery product with 1 converts it back.
   if (const int result = mpi_assign(&RR, &one)) return result;
   if (const int result = mpi_shift_l(&RR, 2 * kMpiLimbBits * N->n)) return result;
   if (const int result = mpi_mod_mpi(&RR, &RR, N)) return result;
@@ -58,7 +58,8 @@ int montgomery::copy(mpi* X, const mpi* A) const {
   return result != 0 ? result : mpi_assign(X, A);
 }
 
-// -1 / m0 mod 2^32 for an odd m0: its inverse modulo 2^4, then Newton steps that double the bits.
+// Returns -1 / m0 mod 2^32 for an odd m0. Starts with the inverse of m0 modulo 2^4. Each Newton
+// step then doubles the number of correct bits.
 WRAPS_ON_PURPOSE uint32_t montgomery_constant(uint32_t m0) {
   uint32_t x = m0 + ((m0 * 2 + 4) & 8);
   for (int bits = kMpiLimbBits; bits >= 8; bits /= 2) x *= 2 - m0 * x;
@@ -73,7 +74,7 @@ int window_size(int bits) {
 }
 
 // Computes the powers W[i] = W[1]^i for each index i of w bits whose highest bit is set. A window
-// begins with a set bit, so no other power is ever needed. For w = 1 that is W[1] alone.
+// starts with a set bit, so no other power is needed. For w = 1, the only power is W[1].
 int fill_window(mpi_local* W, int w, montgomery* m) {
   const int j = 1 << (w - 1);
   if (const int result = m->copy(&W[j], &W[1])) return result;
@@ -103,7 +104,7 @@ void raise(mpi* X, const mpi* E, const mpi_local* W, int w, montgomery* m) {
     nbits = 0;
     wbits = 0;
   }
-  // The exponent bits that are left. They are fewer than w.
+  // The remaining exponent bits, which are fewer than w.
   for (; nbits > 0; --nbits) {
     m->multiply(X, X);
     wbits <<= 1;

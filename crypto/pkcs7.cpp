@@ -12,15 +12,15 @@
 
 namespace {
 
-// The block, and positions in it: offsets from its start, which may lie beyond its end.
+// The block. A position in it is an offset from its start, which may be beyond its end.
 struct Block {
   const uint8_t* bytes;
   size_t length;
 
-  // Reads the header at `offset`. The header itself must lie within the block. The element must end
+  // Reads the header at `offset`. The header itself must be inside the block. The element must end
   // within `bound` bytes from `offset`.
   bool Read(size_t offset, size_t bound, asn1_hdr* hdr) const;
-  // Reads the header at `offset` of an element that must end at or before `end`, which lies in the
+  // Reads the header at `offset`. The element must end at or before `end`, which must be inside the
   // block.
   bool ReadInside(size_t offset, size_t end, asn1_hdr* hdr) const;
   // The offsets where an element's contents start, and where they end.
@@ -55,7 +55,8 @@ bool ReadBlock(const Block& block, pkcs7* record) {
   asn1_hdr certificates;
   x509_certificate certificate;
   if (!ReadHeaders(block, &certificates)) return Fail("processPKCS7Header() error");
-  // Deliberate: if the certificate does not parse, one line is printed, and none for the step.
+  // Deliberate: this failure prints only the line of ReadCertificate. Every other failure prints a
+  // second line, which names the step.
   if (!ReadCertificate(block, certificates, &certificate, record)) return false;
   if (!ReadPublicKey(block, certificate, record)) return Fail("processPublicKey() error");
   return ReadSigner(block, certificates, record) || Fail("processSignHeader() error");
@@ -71,9 +72,9 @@ bool Block::ReadInside(size_t offset, size_t end, asn1_hdr* hdr) const {
   return offset <= end && asn1_get_next(bytes + offset, end - offset, hdr) == 0;
 }
 
-// Goes from the start of the block to the [0] of its certificates and leaves that header in `hdr`.
-// Deliberate: no label is checked. Each length is compared with the whole block's length, counted
-// from the element itself.
+// Reads the headers from the start of the block to the [0] of the certificates. Leaves the last
+// header in `hdr`. Deliberate: no tag is checked. Each length is compared with the length of the
+// whole block, counted from the element's own position.
 WRAPS_ON_PURPOSE bool ReadHeaders(const Block& block, asn1_hdr* hdr) {
   if (!block.Read(0, block.length, hdr) || !block.Read(block.Enter(*hdr), block.length, hdr)) {
     return Fail("CANT PROCESS CERTIFICATE TAG");
@@ -87,15 +88,15 @@ WRAPS_ON_PURPOSE bool ReadHeaders(const Block& block, asn1_hdr* hdr) {
       block.Read(block.Skip(*hdr), block.length, hdr)) {   // the [0] of the certificates
     return true;
   }
-  // Deliberate: an unreadable header has a null payload. The offset printed is the distance from
-  // the block to the null address.
+  // Deliberate: the payload of an unreadable header is null. The printed offset is therefore the
+  // distance from the block to the null address.
   const uintptr_t offset =
       reinterpret_cast<uintptr_t>(hdr->payload) - reinterpret_cast<uintptr_t>(block.bytes);
   return Fail("CANT PROCESS CERTIFICATE TAG = %d, offset = %p", static_cast<int>(hdr->tag),
               reinterpret_cast<void*>(offset));
 }
 
-// Deliberate: of several certificates the first is taken, even if the signer names another one.
+// Deliberate: the first of several certificates is used, even if the SignerInfo names another.
 bool ReadCertificate(const Block& block, const asn1_hdr& certificates,
                      x509_certificate* certificate, pkcs7* record) {
   const size_t available = block.length - block.Enter(certificates);
@@ -110,7 +111,7 @@ bool ReadCertificate(const Block& block, const asn1_hdr& certificates,
   return true;
 }
 
-// The RSAPublicKey (RFC 8017 §A.1.1). Deliberate: only tag numbers are checked, not their classes.
+// Reads the RSAPublicKey (RFC 8017 §A.1.1). Deliberate: tag numbers are checked, classes are not.
 bool ReadPublicKey(const Block& block, const x509_certificate& certificate, pkcs7* record) {
   asn1_hdr hdr;
   if (asn1_get_next(certificate.public_key, certificate.public_key_length, &hdr) != 0) {
@@ -125,8 +126,8 @@ bool ReadPublicKey(const Block& block, const x509_certificate& certificate, pkcs
   record->modulus = modulus.payload + zeros;
   record->modulus_length = modulus.length - zeros;
 
-  // Deliberate: the exponent's length is compared with the modulus's, not with the rest of the key.
-  // The exponent is copied, so its contents must lie within the block.
+  // Deliberate: the exponent's length is compared with the length of the modulus, not with the rest
+  // of the key. The exponent is copied, so its contents must be inside the block.
   asn1_hdr exponent;
   if (!block.Read(block.Skip(modulus), modulus.length, &exponent)) return Fail(kUnreadable);
   if (exponent.tag != kAsn1Integer) return Fail(kNotAnInteger);
@@ -135,9 +136,9 @@ bool ReadPublicKey(const Block& block, const x509_certificate& certificate, pkcs
   return true;
 }
 
-// Deliberate: an exponent of more than four bytes overwrites the modulus length, which follows it
-// in the record. Bytes beyond that are dropped. Exponents in use have at most three bytes; the
-// maker of a longer one thereby states the modulus length, too.
+// Deliberate: an exponent of more than four bytes overwrites the modulus length, which follows the
+// exponent in the record. Bytes after the eighth are dropped. Exponents in use have at most three
+// bytes. The maker of an exponent of more than four bytes also sets the modulus length.
 void StoreExponent(const asn1_hdr& exponent, pkcs7* record) {
   constexpr size_t kStart = offsetof(pkcs7, exponent);
   constexpr size_t kEnd = offsetof(pkcs7, modulus_length) + sizeof(record->modulus_length);
@@ -148,8 +149,8 @@ void StoreExponent(const asn1_hdr& exponent, pkcs7* record) {
          std::min<size_t>(exponent.length, kEnd - kStart));
 }
 
-// The first SignerInfo (RFC 2315 §9.2) of the signerInfos, which follow the certificates.
-// Deliberate: its failures print "PUBLIC KEY ERROR", like those of the public key.
+// Reads the first SignerInfo (RFC 2315 §9.2) of the signerInfos, which follow the certificates.
+// Deliberate: failures here print "PUBLIC KEY ERROR", like failures in the public key.
 bool ReadSigner(const Block& block, const asn1_hdr& certificates, pkcs7* record) {
   asn1_hdr signers, signer, version, issuer;
   if (!block.ReadInside(block.Skip(certificates), block.length, &signers) ||
@@ -163,10 +164,10 @@ bool ReadSigner(const Block& block, const asn1_hdr& certificates, pkcs7* record)
     return Fail("PUBLIC KEY ERROR: parse algorithm identifier");
   }
 
-  // Deliberate: the elements are taken by position, and their labels are not checked. If a signer
-  // has authenticated attributes, its digestEncryptionAlgorithm is taken for the digest and does
-  // not verify: the signature must cover the signature file itself. The lengths are compared with
-  // the distance from the start of the block to the end of the digestAlgorithm.
+  // Deliberate: the elements are found by position, and their tags are not checked. If a SignerInfo
+  // has authenticated attributes, its digestEncryptionAlgorithm is read as the encryptedDigest and
+  // does not verify. Its real signature would not cover the signature file itself. The lengths are
+  // compared with the distance from the start of the block to the end of the digestAlgorithm.
   const size_t bound = block.Skip(algorithm);
   asn1_hdr encryption, digest;
   if (!block.Read(bound, bound, &encryption) ||
@@ -178,8 +179,8 @@ bool ReadSigner(const Block& block, const asn1_hdr& certificates, pkcs7* record)
   return true;
 }
 
-// The AlgorithmIdentifier at `offset`, which must end at `end` or before. The digest that it names
-// does not matter: the signature itself names its digest.
+// Reads the AlgorithmIdentifier at `offset`, which must end at or before `end`. Its digest
+// algorithm does not matter: the signature itself names its digest algorithm.
 bool ReadDigestAlgorithm(const Block& block, size_t offset, size_t end, asn1_hdr* algorithm) {
   asn1_oid oid;
   const uint8_t* next;

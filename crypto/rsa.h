@@ -11,7 +11,7 @@
 
 // A public key.
 struct rsa_context {
-  int32_t len;  // bytes of the modulus as it was given, and of every signature
+  int32_t len;  // length in bytes of the modulus as given, and of every signature
   mpi N;        // the modulus
   mpi E;        // the public exponent
 };
@@ -23,14 +23,14 @@ inline void mpi_apply(void (*call)(mpi* X, ...), rsa_context* ctx) {
 // A context that starts empty and is released when its scope ends.
 using rsa_local = mpi_owner<rsa_context>;
 
-// The bounds of a modulus that verifies, in bytes.
+// The least and the greatest length of a modulus that verifies, in bytes.
 inline constexpr uint32_t kRsaMinModulusSize = 16;
 inline constexpr uint32_t kRsaMaxModulusSize = 512;
 
-// True if anyone can forge signatures for a key with this exponent. The caller refuses these keys.
-// Deliberate: only 1 and -1 are refused. The arithmetic ignores the exponent's sign (mpi_pow_mod).
-// A number to the power of 1 is itself, so anyone could write down a signature for any key
-// (docs/decisions/exponent-of-one.md).
+// True if anyone can forge signatures for a key with this exponent. The caller must refuse these
+// keys. Deliberate: only 1 and -1 are refused. The arithmetic ignores the exponent's sign
+// (mpi_pow_mod). A number to the power of 1 is itself, so anyone could write a valid signature for
+// any key (docs/decisions/exponent-of-one.md).
 constexpr bool rsa_is_forgeable(uint32_t exponent_value) {
   return exponent_value == 1 || exponent_value == UINT32_MAX;
 }
@@ -53,11 +53,11 @@ inline constexpr int kRsaPublicFlag = 16;
 int rsa_set_key(rsa_context* ctx, const uint8_t* modulus, const uint8_t* exponent,
                 uint32_t exponent_value, uint32_t len);
 
-// Checks `sig`, of the context's `len` bytes, big-endian, against the digests of the signed data.
-// The signature itself names its digest. `sha1` (20 bytes) and `md5` (16 bytes) are not null.
-// `sha256` (32 bytes) may be null; then no SHA-256 signature verifies.
+// Checks the signature `sig` against the digests of the signed data. `sig` is big-endian and has
+// the context's `len` bytes. The signature itself names its digest algorithm. `sha1` (20 bytes) and
+// `md5` (16 bytes) must not be null. If `sha256` (32 bytes) is null, no SHA-256 signature verifies.
 //
-// Returns 0 if the signature carries the digest, and otherwise
+// Returns 0 if the signature contains the right digest, and otherwise
 //   kRsaBadInput (5)        null `ctx`, `sha1` or `sig`; `len` outside 16..512; signature not below
 //                           the modulus
 //   kRsaInvalidPadding (7)  not a block of type 1 (RFC 8017 §9.2); a DigestInfo of an unknown

@@ -2,8 +2,8 @@
 #pragma once
 
 // Declares that a function computes unsigned sums and products modulo 2^32 and handles the carries
-// itself. scripts/check takes an unsigned overflow in any other function for a mistake. The mark
-// has no other effect.
+// itself. scripts/check fails for an unsigned overflow in any other function. The mark has no other
+// effect.
 #ifdef __clang__
 #define WRAPS_ON_PURPOSE __attribute__((no_sanitize("unsigned-integer-overflow")))
 #else

@@ -13,12 +13,12 @@ struct Range {
 
 Range Contents(const asn1_hdr& hdr) { return {hdr.payload, hdr.length}; }
 
-// The rest of `range` from `position` on, which lies in it.
+// Returns the part of `range` from `position` to the end. `position` must be in `range`.
 Range After(const Range& range, const uint8_t* position) {
   return {position, range.length - static_cast<size_t>(position - range.start)};
 }
 
-// Reads the header of the next element and goes past the element.
+// Reads the header of the next element. `range` then starts after this element.
 bool Next(Range* range, asn1_hdr* hdr) {
   if (asn1_get_next(range->start, range->length, hdr) != 0) return false;
   *range = After(*range, hdr->payload + hdr->length);
@@ -50,8 +50,8 @@ uint32_t ToUint32(const asn1_hdr& integer) {
 bool HoldsNul(const asn1_hdr& hdr) { return memchr(hdr.payload, 0, hdr.length) != nullptr; }
 
 // The parts of a certificate, in order. ParseTbs, ParseVersionAndSerial, ParseOptionalFields and
-// ParseSignature return a code of x509_certificate_parse. The others return true for success, or 0,
-// and false, or a negative number of their own, for failure. Their caller chooses the code.
+// ParseSignature return a code of x509_certificate_parse. The others return true or 0 for success,
+// and false or a negative number for failure. Their caller chooses the code.
 int ParseTbs(Range tbs, x509_certificate* cert);
 int ParseVersionAndSerial(Range* tbs, x509_certificate* cert);
 bool ParseAlgorithm(Range* range, asn1_oid* oid, asn1_oid* params);
@@ -140,7 +140,7 @@ int ParseTbs(Range tbs, x509_certificate* cert) {
 int ParseVersionAndSerial(Range* tbs, x509_certificate* cert) {
   asn1_hdr hdr;
   if (!Next(tbs, &hdr)) return -5;
-  // Deliberate: any element of the context-specific class is taken for the version here.
+  // Deliberate: any element of the context-specific class is read as the version here.
   if (hdr.class_ == kAsn1Context) {
     Range inner = Contents(hdr);
     const Range from_inner = {inner.start, inner.length + tbs->length};
@@ -157,8 +157,7 @@ int ParseVersionAndSerial(Range* tbs, x509_certificate* cert) {
   return 0;
 }
 
-// An AlgorithmIdentifier (RFC 5280 §4.1.1.2). Parameters are kept when they are an object
-// identifier.
+// An AlgorithmIdentifier (RFC 5280 §4.1.1.2). Parameters are kept if they are an object identifier.
 bool ParseAlgorithm(Range* range, asn1_oid* oid, asn1_oid* params) {
   asn1_hdr hdr;
   if (!NextUniversal(range, kAsn1Sequence, &hdr)) return false;
@@ -168,9 +167,11 @@ bool ParseAlgorithm(Range* range, asn1_oid* oid, asn1_oid* params) {
   return true;
 }
 
-// A Name (RFC 5280 §4.1.2.4); `next` receives the position after it. Returns 0, or -3 for a missing
-// SEQUENCE, -7 for a missing SET, -8 for a missing attribute type, -1 for an attribute value that
-// is missing, holds a NUL or is one too many. Each becomes -12. `name` is empty after a failure.
+// Reads a Name (RFC 5280 §4.1.2.4). Stores the position after it in `next`. Returns 0 for success,
+// -3 for a missing SEQUENCE, -7 for a missing SET, and -8 for a missing attribute type. Returns -1
+// for an attribute value that is missing, is not universal, contains a NUL, or is one more than
+// kX509MaxAttributes. The caller returns -12 for each of these codes. `name` is empty after a
+// failure.
 int x509_parse_name(const uint8_t* buf, size_t len, x509_name* name, const uint8_t** next) {
   Range range = {buf, len};
   asn1_hdr hdr;
@@ -205,7 +206,7 @@ bool IsType(const asn1_oid& oid, const KnownAttribute& attribute) {
          memcmp(oid.oid, attribute.arcs, attribute.arc_count * sizeof(uint32_t)) == 0;
 }
 
-// Deliberate: a kept value must not hold a NUL, except for the e-mail address.
+// Deliberate: a kept value must not contain a NUL, except for the e-mail address.
 bool KeepAttribute(const asn1_oid& type, const asn1_hdr& value, x509_name* name) {
   if (IsType(type, kEmailAddress)) {
     name->email = value.payload;
@@ -232,16 +233,16 @@ bool ParseValidity(Range* tbs, x509_certificate* cert) {
   return true;
 }
 
-// Two decimal digits, or -1.
+// Returns the value of two decimal digits, or -1 if one of them is not a digit.
 int TwoDigits(const uint8_t* digits) {
   const int tens = digits[0] - '0';
   const int ones = digits[1] - '0';
   return tens < 0 || tens > 9 || ones < 0 || ones > 9 ? -1 : tens * 10 + ones;
 }
 
-// The two forms of RFC 5280 §4.1.2.5: UTC, with seconds and without fractions of them. Returns 0,
-// or -1 for any other form. Deliberate: nobody reads the times, so the range of the numbers is not
-// checked.
+// Reads the two forms of RFC 5280 §4.1.2.5: UTC, with seconds and without fractions of a second.
+// Returns 0, or -1 for any other form. Deliberate: the tool does not use the times, so the range of
+// the numbers is not checked.
 int x509_parse_time(const uint8_t* value, size_t len, uint32_t tag, x509_parser_time* time) {
   constexpr size_t kAfterYear = sizeof("MMDDHHMMSSZ") - 1;
   const size_t year_digits = tag == kAsn1UtcTime ? 2 : 4;
@@ -331,9 +332,10 @@ bool ReadExtensionValue(Range extension, bool* critical, Range* value) {
   if (hdr.tag == kAsn1Boolean) {
     if (hdr.length != 1) return false;
     *critical = hdr.payload[0] != 0;
-    // Deliberate: the next header starts at the flag's own byte. TRUE in DER, 0xFF, reads as the
-    // first octet of a long-form tag of the private class; the tag number is then the identifier
-    // octet of the OCTET STRING. A written FALSE, which DER leaves out, is refused.
+    // Deliberate: the next header is read from the flag's own byte on. TRUE in DER is 0xFF. This
+    // byte reads as the first octet of a long-form tag of the private class. The identifier octet
+    // of the OCTET STRING then reads as the tag number. A FALSE that is written out, although DER
+    // omits it, is refused.
     extension = After(from_flag, hdr.payload);
     if (!Next(&extension, &hdr)) return false;
     if (hdr.class_ != kAsn1Universal && hdr.class_ != kAsn1Private) return false;
@@ -378,8 +380,8 @@ bool ParseBasicConstraints(Range value, x509_certificate* cert) {
   return true;
 }
 
-// GeneralNames (RFC 5280 §4.2.1.6), without the SEQUENCE's header. Returns 0, or -1 if a header
-// cannot be read, a text holds a NUL or a registeredID is malformed.
+// Reads GeneralNames (RFC 5280 §4.2.1.6) without the header of the SEQUENCE. Returns 0, or -1 if a
+// header cannot be read, a text contains a NUL or a registeredID is malformed.
 int x509_parse_ext_alt_name(x509_name* name, const uint8_t* buf, size_t len) {
   Range names = {buf, len};
   while (names.length > 0) {
@@ -409,7 +411,8 @@ bool KeepAltName(const asn1_hdr& hdr, x509_name* name) {
   }
 }
 
-// A text with a NUL would read differently elsewhere. It is refused, and none is kept.
+// Other programs may read a text only up to a NUL. A text with a NUL is therefore refused, and the
+// field is left empty.
 bool KeepText(const asn1_hdr& hdr, const uint8_t** text, uint64_t* length) {
   const bool good = !HoldsNul(hdr);
   *text = good ? hdr.payload : nullptr;

@@ -1,6 +1,6 @@
 // Reads one X.509 certificate (RFC 5280 §4.1) into a record that points into the caller's bytes.
-// Only the structure is read; the caller checks dates, signatures and chains. No allocation, no
-// logging. The caller's bytes must outlive the record.
+// Only the structure is read. Dates, signatures and chains are not checked here. The function
+// neither allocates nor logs. The caller's bytes must outlive the record.
 #pragma once
 
 #include <cstddef>
@@ -14,7 +14,7 @@ struct x509_parser_time {
   uint8_t month, day, hour, minute, second;
 };
 
-// The attributes of a name that are kept, as x509_name_attribute::type.
+// The types of the attributes that a name keeps: the values of x509_name_attribute::type.
 enum : uint32_t {
   kX509DomainComponent = 1,
   kX509CommonName = 2,
@@ -34,8 +34,9 @@ struct x509_name_attribute {
 
 inline constexpr size_t kX509MaxAttributes = 20;
 
-// A distinguished name, with the alternative names that an extension gives for it. A missing part
-// is null and 0. Of several parts of one kind the last one counts.
+// A distinguished name, with the alternative names from its extension. A missing part is a null
+// pointer with length 0. The last of several e-mail addresses is kept, and the last of several
+// alternative names of one kind.
 struct x509_name {
   x509_name_attribute attributes[kX509MaxAttributes];  // in order of appearance
   uint64_t attribute_count;
@@ -52,7 +53,7 @@ struct x509_name {
   asn1_oid rid;  // registeredID
 };
 
-// x509_certificate::extensions_present
+// The bits of x509_certificate::extensions_present.
 inline constexpr uint32_t kX509BasicConstraints = 1;
 inline constexpr uint32_t kX509PathLenConstraint = 2;
 inline constexpr uint32_t kX509KeyUsage = 4;
@@ -88,9 +89,9 @@ struct x509_certificate {
 //   -2   `buf` or `cert` is null, or `len` is 0
 //   -3   the Certificate or the tbsCertificate is not a SEQUENCE
 //   -4   the signatureValue is not a BIT STRING
-//   -5   a header of the version, the serialNumber or the optional fields cannot be read, the
-//        optional fields are of another class than context-specific, or the signatureValue is empty
-//   -6   the signatureValue does not end with a whole byte
+//   -5   a header of the version, the serialNumber or the optional fields cannot be read, the first
+//        optional field is not context-specific, or the signatureValue is empty
+//   -6   the signatureValue has unused bits
 //   -9   the version is not v1, v2 or v3
 //   -10  the serialNumber is not an INTEGER
 //   -11  a signature's AlgorithmIdentifier is malformed
@@ -98,5 +99,5 @@ struct x509_certificate {
 //   -13  the validity is malformed
 //   -14  the subjectPublicKeyInfo is malformed
 //   -15  an extension is malformed, is critical and unknown, or is in a v2 certificate
-// After a failure, `cert` keeps the fields that were read before it, unless it is null.
+// After a failure, `cert`, if it is not null, keeps the fields that were read before the failure.
 int x509_certificate_parse(const uint8_t* buf, size_t len, x509_certificate* cert);

@@ -6,7 +6,8 @@
 #include <cstdint>
 #include <vector>
 
-// Each replaces the contents of `out` by the digest of all of `in`, which may be empty.
+// Each function replaces the contents of `out` by the digest of all bytes of `in`. `in` may be
+// empty.
 
 // 16 bytes.
 void ComputeMD5Digest(const std::vector<uint8_t>& in, std::vector<uint8_t>& out);
@@ -15,7 +16,7 @@ void ComputeSHA1Digest(const std::vector<uint8_t>& in, std::vector<uint8_t>& out
 // 32 bytes.
 void ComputeSHA256Digest(const std::vector<uint8_t>& in, std::vector<uint8_t>& out);
 
-// The digests that a signature may be made over. The signature itself names the one that counts.
+// The digests that a signature may cover. The signature itself names the one that it covers.
 struct Digests {
   std::vector<uint8_t> sha1;
   std::vector<uint8_t> sha256;

@@ -13,7 +13,8 @@
 
 namespace {
 
-// The link in /proc to the file that is open as `fd`. It still leads there if the path does not.
+// The link in /proc to the file that is open as `fd`. It leads to this file even if the file's path
+// no longer does.
 std::string DescriptorLink(int fd) { return "/proc/self/fd/" + std::to_string(fd); }
 
 ssize_t FindSize(int fd, struct stat* state);
@@ -55,7 +56,7 @@ bool ReadFile(const std::string& path, std::vector<uint8_t>& out, struct stat* s
   if (out.empty() && out.capacity() < static_cast<size_t>(size)) std::vector<uint8_t>().swap(out);
   out.resize(static_cast<size_t>(size));
   // Deliberate: reading succeeds even if the file shrinks meanwhile. The end of `out` then keeps
-  // its old bytes. Every caller takes the digest of `out`, and that digest does not match.
+  // its old bytes. Every caller computes the digest of `out`, and that digest then does not match.
   ReadBytes(fd, out);
   if (state != nullptr) *state = found;
   return true;
@@ -71,8 +72,9 @@ std::vector<uint8_t> StringToVector(const std::string& s) { return {s.begin(), s
 
 namespace {
 
-// Returns the size of the regular file `fd` in bytes, its state in `state`, and the position at the
-// start. Returns -1 if `fd` is not a regular file, cannot seek, or does not fit in memory.
+// Returns the size of the regular file `fd` in bytes. Stores its state in `state`, and sets its
+// position to the start. Returns -1 if `fd` is not a regular file, cannot seek, or does not fit in
+// memory.
 ssize_t FindSize(int fd, struct stat* state) {
   if (fstat(fd, state) != 0 || !S_ISREG(state->st_mode)) return -1;
   const off_t size = lseek(fd, 0, SEEK_END);

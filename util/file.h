@@ -1,5 +1,5 @@
-// Opens files, reads them whole, and finds their paths; turns strings into bytes. The functions
-// keep no state. Results and filled arguments belong to the caller. Only ReadFile logs.
+// Opens files, reads them whole, and finds their paths. Converts strings to bytes. The functions
+// keep no state. The caller owns results and filled arguments. Only ReadFile logs.
 #pragma once
 
 #include <sys/stat.h>
@@ -9,7 +9,8 @@
 #include <vector>
 
 // True if both states, from fstat, are of the same regular file with equal size, mtime and ctime.
-// Not every change of a file's bytes changes these (docs/decisions/the-file-that-was-read.md).
+// Some changes of a file's bytes leave all of these unchanged
+// (docs/decisions/the-file-that-was-read.md).
 bool IsSameFile(const struct stat& before, const struct stat& after);
 
 // Opens the file at `path` for reading; `flags` are further flags of open. Returns the descriptor,
@@ -19,20 +20,20 @@ bool IsSameFile(const struct stat& before, const struct stat& after);
 int OpenForReading(const char* path, int flags);
 
 // Reads the regular file at `path` into `out`, which then has exactly the file's size in bytes.
-// Stores in `state`, unless it is null, the file's state before the first byte was read. An `fd`
-// other than -1 is the file itself, read from its start; `path` then only appears in messages.
-// Returns false, with `out` and `state` untouched, if the file
+// If `state` is not null, stores there the file's state before the first byte was read. If `fd` is
+// not -1, reads the open file `fd` from its start, and uses `path` only in messages. Returns false,
+// with `out` and `state` unchanged, if the file
 //   - cannot be opened (OpenForReading): "Can't open file: %s\n", or
 //   - is not a regular file, has an unknown size, or does not fit in memory:
 //     "Can't read file: %s (streamoff=%zd)\n" with -1 for the size.
-// Returns true even if the file gives fewer bytes than its size. The rest of `out` then holds its
-// old bytes, and zeros where it was shorter before. An empty `out` that is too small frees its
-// memory before it allocates, so that growing copies nothing and never holds two buffers.
+// Returns true even if fewer bytes can be read than the file's size. The rest of `out` then keeps
+// its old bytes, and has zeros where it was shorter before. If `out` is empty and its memory is too
+// small, this memory is freed first. Growing then copies nothing and never needs two buffers.
 bool ReadFile(const std::string& path, std::vector<uint8_t>& out, struct stat* state = nullptr,
               int fd = -1);
 
-// The path of the file that is open as `fd`, as the kernel gives it, cut to its first 4095 bytes.
-// Empty if `fd` is not open or the kernel gives no path.
+// The path of the file that is open as `fd`, as the kernel reports it, cut to its first 4095 bytes.
+// Empty if `fd` is not open or the kernel reports no path.
 std::string GetFilenameByFd(int fd);
 
 // The bytes of `s` in order, without a terminating NUL.

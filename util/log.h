@@ -15,7 +15,7 @@ inline constexpr char kLogTag[] = "ApkToolkit";
 // longer texts.
 inline constexpr size_t kLogTextSize = 1024;
 
-// Writes one record with `priority` (an android_LogPriority). `format` and `arguments` as for
+// Writes one record with `priority` (an android_LogPriority). `format` and `arguments` are those of
 // vprintf.
 __attribute__((format(printf, 2, 0))) inline void LogText(int priority, const char* format,
                                                           va_list arguments) {

@@ -25,7 +25,7 @@ int Read(const Bytes& bytes, asn1_hdr* hdr) {
   return asn1_get_next(bytes.data(), bytes.size(), hdr);
 }
 
-// A header full of former contents.
+// A header whose fields all have old values.
 asn1_hdr Used() {
   asn1_hdr hdr;
   memset(&hdr, 0xee, sizeof(hdr));
@@ -133,9 +133,9 @@ TEST(Asn1GetNext, LongFormTagMayHaveOneOctet) {
 }
 
 TEST(Asn1GetNext, LongFormTagKeepsItsLow32Bits) {
-  // Ten octets: 0x11223344 is in the low 32 of 70 bits, below ones. In groups of seven bits,
-  // 0x11223344 is 0001 0001001 0001000 1100110 1000100, so 0x7f turns the fifth octet from the end
-  // into 0xf1.
+  // Ten octets have 70 bits. The low 32 bits are 0x11223344, and all bits above are ones. In groups
+  // of seven bits, 0x11223344 is 0001 0001001 0001000 1100110 1000100. With the ones above, the
+  // first of these groups is 1110001, and its octet is 0xf1.
   asn1_hdr hdr;
   EXPECT_EQ(Read(FromHex("1f ff ff ff ff ff f1 89 88 e6 44 00"), &hdr), 0);
   EXPECT_EQ(hdr.tag, 0x11223344u);
@@ -202,7 +202,7 @@ TEST(Asn1GetNext, FailureLeavesTheLengthReadSoFar) {
 }
 
 TEST(Asn1GetNext, RemainingBytesAreCountedIn32Bits) {
-  // 4 GiB and 6 bytes. The header takes 2 of them, so the low 32 bits of the rest are 4.
+  // 4 GiB and 6 bytes. The header has 2 bytes, so the low 32 bits of the remaining length are 4.
   constexpr size_t kLength = (size_t{1} << 32) + 6;
   void* pages = mmap(nullptr, kLength, PROT_READ | PROT_WRITE,
                      MAP_PRIVATE | MAP_ANONYMOUS | MAP_NORESERVE, -1, 0);
@@ -281,8 +281,8 @@ TEST(Asn1ParseOid, FirstValueIsSplitAtFortyAndEighty) {
 }
 
 TEST(Asn1ParseOid, LargeFirstValueIsSplitBeforeItIsCut) {
-  // 2^32 + 80 = 0x100000050, in groups of seven bits 10000 0000000 0000000 0000000 1010000. Less 80
-  // it is 2^32, whose low 32 bits are 0.
+  // The value is 2^32 + 80 = 0x100000050, in groups of seven bits 10000 0000000 0000000 0000000
+  // 1010000. The second arc is the value minus 80: 2^32, and its low 32 bits are 0.
   const Bytes contents = FromHex("90 80 80 80 50");
   asn1_oid oid;
   EXPECT_EQ(asn1_parse_oid(contents.data(), contents.size(), &oid), 0);
@@ -290,7 +290,8 @@ TEST(Asn1ParseOid, LargeFirstValueIsSplitBeforeItIsCut) {
 }
 
 TEST(Asn1ParseOid, FirstValueOf2To32IsSplitAsItIs) {
-  // In groups of seven bits 10000 and four zeros; 2^32 - 80 = 0xffffffb0.
+  // In groups of seven bits, 2^32 is 10000 and four groups of zeros. The second arc is 2^32 - 80 =
+  // 0xffffffb0.
   const Bytes contents = FromHex("90 80 80 80 00");
   asn1_oid oid;
   EXPECT_EQ(asn1_parse_oid(contents.data(), contents.size(), &oid), 0);
@@ -298,7 +299,7 @@ TEST(Asn1ParseOid, FirstValueOf2To32IsSplitAsItIs) {
 }
 
 TEST(Asn1ParseOid, ArcKeepsItsLow32Bits) {
-  // Ten octets of seven ones each, except for the last bit: 2^70 - 1 less 1.
+  // The last arc has ten octets of seven bits each. All bits are ones except the last: 2^70 - 2.
   const Bytes contents = FromHex("2a ff ff ff ff ff ff ff ff ff 7e");
   asn1_oid oid;
   EXPECT_EQ(asn1_parse_oid(contents.data(), contents.size(), &oid), 0);

@@ -12,7 +12,7 @@ namespace {
 
 constexpr int kRounds = 100000;
 
-// The exponents' bit lengths at which the window grows, with the new window.
+// The bit lengths of the exponent at which the window grows, with the new window size.
 constexpr struct {
   int bits;
   int window;
@@ -54,7 +54,8 @@ void ExpectPower(const mpz_class& a, const mpz_class& e, const Limbs& modulus) {
   ASSERT_EQ(expected, Value(X)) << modulus.size() << " limbs, exponent " << e;
 }
 
-// The number of allocations of an exponentiation: the window's table, and a constant number.
+// Returns the number of allocations of an exponentiation: those for the window table, and a
+// constant number of others.
 int AllocationsForExponent(const mpz_class& e) {
   const Number N({0xfffffff1, 0xfffffff1});
   const Number A({3});
@@ -112,7 +113,7 @@ TEST(MpiMontmul, OfAProductThatTheModulusDividesIsZero) {
   }
 }
 
-// With N = 2^32 - 1 the product is A * B mod N, as R = 1 mod N.
+// With N = 2^32 - 1 the product is A * B mod N, because R mod N is 1.
 TEST(MpiMontmul, SubtractsAlsoWhereTheProductIsBelowTheModulus) {
   const Number N({UINT32_MAX});
   Number A({3, 0});
@@ -120,8 +121,8 @@ TEST(MpiMontmul, SubtractsAlsoWhereTheProductIsBelowTheModulus) {
   Number T(Limbs(4));
   mpi_montmul(&A, &B, &N, 1, &T);
   EXPECT_EQ(15, Value(A));
-  // The scratch limbs held A's old limb 3 below the product 15. The superfluous subtraction left 3
-  // - 15 there, and borrowed from the limb above.
+  // The lower scratch limb contained A's old limb, 3. The upper one contained the product, 15. The
+  // extra subtraction left 3 - 15 in the lower limb, and borrowed 1 from the upper limb.
   EXPECT_EQ(static_cast<uint32_t>(3 - 15), T.p[0]);
   EXPECT_EQ(14u, T.p[1]);
 }
@@ -173,7 +174,7 @@ TEST(MpiPowMod, UsesAWindowOfOneForExponents3And65537) {
   EXPECT_EQ(AllocationsForExponent(1), AllocationsForExponent(PowerOfTwo(23) - 1));
 }
 
-// The table of a window of w bits holds 2^(w-1) powers besides the first. No window has 2 bits.
+// The table for a window of w bits has 2^(w-1) powers besides the first. No window has 2 bits.
 TEST(MpiPowMod, WidensTheWindowWithTheExponent) {
   const int fixed = AllocationsForExponent(1);
   int before = fixed;

@@ -1,5 +1,5 @@
-// The integers, compared with GMP: at least 100,000 operands per operation, made of limbs that
-// provoke carries.
+// The integers, compared with GMP. Each operation gets at least 100,000 operands, made of limbs
+// that cause carries.
 #include "crypto/mpi.h"
 
 #include <gtest/gtest.h>

@@ -7,14 +7,14 @@
 #include "support/certificate.h"
 #include "support/guarded_bytes.h"
 
-// The parser ignores the signature. An invented one takes no time to make.
+// The parser ignores the signature. An invented signature costs no time.
 inline Certificate Unsigned() {
   Certificate certificate;
   certificate.signature = der::BitString(Bytes(8, 0x5a));
   return certificate;
 }
 
-// Parsed where memory ends, so that reading past it crashes.
+// A parsed certificate. Its bytes end where memory ends, so that reading past them crashes.
 struct ParsedCertificate {
   explicit ParsedCertificate(const Bytes& der) : bytes(der) {
     result = x509_certificate_parse(bytes.data(), bytes.size(), &cert);

@@ -1,4 +1,4 @@
-// The first SignerInfo, and damaged blocks.
+// Tests processCert with the first SignerInfo and with damaged blocks.
 #include <gtest/gtest.h>
 
 #include <cstdlib>
@@ -18,7 +18,7 @@ SignatureBlock WithSigners(const Bytes& signer_infos) {
   return block;
 }
 
-// A SET of one SignerInfo, with a good start and then these elements.
+// A SET of one SignerInfo. It has a version and an issuer, and then these elements.
 Bytes SignerOf(const std::vector<Bytes>& elements) {
   return der::Set({der::Sequence({der::Integer(1), der::Sequence({}), Concat(elements)})});
 }
@@ -34,7 +34,7 @@ Bytes BlockEndingInSigners(const Bytes& signers) {
       Concat({der::Context(0, *WithRsaKey(Bytes(64, 0x77), {3}).certificates), signers}));
 }
 
-// True if the parts of the record that must lie in the block do.
+// True if every part of the record that must be inside the block is inside.
 bool Inside(const GuardedBytes& block, const pkcs7& record) {
   const auto inside = [&](const uint8_t* value, size_t length) {
     if (value == nullptr) return length == 0;
@@ -56,7 +56,8 @@ bool StaysInside(const GuardedBytes& block) {
 }  // namespace
 
 TEST(ProcessCertSigner, UnreadableHeadersGiveTheUnreadableLine) {
-  // No signerInfos, half of a header, no SignerInfo, no version, no issuer, half of an issuer.
+  // No signerInfos, half of a header, a SET without its contents, no SignerInfo, no version, no
+  // issuer, an issuer without its contents.
   for (const char* digits : {"", "31", "31 05", "31 00", "31 02 30 00", "31 05 30 03 02 01 01",
                              "31 07 30 05 02 01 01 30 05"}) {
     const ProcessedBlock processed(WithSigners(FromHex(digits)));
@@ -68,7 +69,7 @@ TEST(ProcessCertSigner, UnreadableHeadersGiveTheUnreadableLine) {
 }
 
 TEST(ProcessCertSigner, SignersThatWouldStartBeyondTheEndGiveTheUnreadableLine) {
-  // The [0] of the certificates, at the end of the block, claims five bytes more.
+  // The [0] of the certificates ends the block. Its length is five bytes greater than its contents.
   const Bytes certificate = *WithRsaKey(Bytes(64, 0x77), {3}).certificates;
   Bytes certificates = der::Context(0, Concat({certificate, Bytes(5)}));
   certificates.resize(certificates.size() - 5);
@@ -93,8 +94,9 @@ TEST(ProcessCertSigner, SignersAndTheirFirstMayEndWithTheBlock) {
 }
 
 TEST(ProcessCertSigner, VersionAndIssuerMayEndWithTheBlock) {
-  // The signer has no contents, so the digestAlgorithm is missing after the version and the issuer.
-  // Both end with the block; then either is one byte longer.
+  // The SignerInfo is empty. The version and the issuer are read from the bytes after it, and the
+  // digestAlgorithm is missing. First the issuer ends with the block. Then the version or the
+  // issuer is one byte longer.
   const std::pair<const char*, const char*> cases[] = {
       {"31 00 30 00 02 03 01 02 03 30 00", kNoAlgorithm},
       {"31 00 30 00 02 04 01 02 03 30 00", kUnreadable},
@@ -117,8 +119,8 @@ TEST(ProcessCertSigner, MalformedDigestAlgorithmGivesItsLine) {
       SignerOf({der::Context(16, der::Oid("1.2.3")), rest}),      // another class
       SignerOf({der::Sequence({}), rest}),                        // no OID
       SignerOf({der::Sequence({der::Null()}), rest}),             // no OID either
-      SignerOf({der::Sequence({FromHex("06 00")}), rest}),        // an empty one
-      SignerOf({der::Sequence({FromHex("06 02 2a 86")}), rest}),  // one that ends within an arc
+      SignerOf({der::Sequence({FromHex("06 00")}), rest}),        // an empty OID
+      SignerOf({der::Sequence({FromHex("06 02 2a 86")}), rest}),  // an OID that ends within an arc
   };
   for (const Bytes& signer_infos : cases) {
     const ProcessedBlock processed(WithSigners(signer_infos));
@@ -129,7 +131,8 @@ TEST(ProcessCertSigner, MalformedDigestAlgorithmGivesItsLine) {
 }
 
 TEST(ProcessCertSigner, DigestAlgorithmMustEndWithinTheSignerInfo) {
-  // The same bytes three times: the SignerInfo ends before, within and after the digestAlgorithm.
+  // The same bytes four times. The SignerInfo ends one byte before the digestAlgorithm, at its
+  // start, one byte before its end, and at its end.
   const Bytes start = Concat({der::Integer(1), der::Sequence({})});
   const Bytes rest = Concat({AlgorithmIdentifier("1.2.3"), der::OctetString(Bytes(8, 1))});
   const size_t algorithm_end = start.size() + Sha256Algorithm().size();
@@ -152,7 +155,8 @@ TEST(ProcessCertSigner, AnyDigestAlgorithmAndParametersAreAccepted) {
 }
 
 TEST(ProcessCertSigner, MissingEncryptedDigestGivesTheUnreadableLine) {
-  // No digestEncryptionAlgorithm, half of its header, no encryptedDigest, half of its header.
+  // No digestEncryptionAlgorithm, half of its header, no encryptedDigest, half of its header, and
+  // half of a long-form tag.
   const Bytes algorithm = AlgorithmIdentifier("1.2.3");
   for (const Bytes& rest : {Bytes(), Bytes{0x30}, algorithm, Concat({algorithm, {0x04}}),
                             Concat({algorithm, {0x1f}})}) {
@@ -226,7 +230,8 @@ TEST(ProcessCertBounds, EveryTruncationIsRefused) {
 }
 
 TEST(ProcessCertBounds, EveryTruncationOfABlockOfIndefiniteLengthsStaysInside) {
-  // The SignerInfo ends with its digestAlgorithm, so the block reads as long as that is present.
+  // The SignerInfo ends with its digestAlgorithm. It can therefore still be read if the block is
+  // cut after that element.
   const Bytes whole = BlockEndingInSigners(Concat({
       FromHex("31 80 30 14 02 01 01 30 80"),
       Sha256Algorithm(),

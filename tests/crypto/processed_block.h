@@ -1,5 +1,4 @@
-// A signature block and the record that processCert makes of it, for the tests of the walk through
-// it.
+// A signature block and the record that processCert makes of it, for the tests of processCert.
 #pragma once
 
 #include <gtest/gtest.h>
@@ -55,7 +54,7 @@ struct ProcessedBlock {
   std::string output;
 };
 
-// A block around a certificate with this RSAPublicKey or other contents. The signatures are
+// A block with a certificate whose key BIT STRING contains `public_key`. The signatures are
 // invented.
 inline SignatureBlock WithPublicKey(const Bytes& public_key) {
   SignatureBlock block;
@@ -71,8 +70,9 @@ inline SignatureBlock WithRsaKey(const Bytes& modulus, const Bytes& exponent) {
   return WithPublicKey(der::Sequence({der::Integer(modulus), der::Integer(exponent)}));
 }
 
-// A block that ends with these bytes, which start with the [0] of the certificates. The elements
-// around them have the indefinite form, so they fit before any end of the block.
+// A block that ends with these bytes, which start with the [0] of the certificates. The enclosing
+// elements have the indefinite form, which reads as length 0. They therefore never end beyond the
+// block.
 inline Bytes BlockEndingIn(const Bytes& certificates) {
   return Concat({FromHex("30 80"), der::Oid("1.2.840.113549.1.7.2"),
                  FromHex("a0 80 30 80 02 01 01 31 00 30 00"), certificates});

@@ -1,4 +1,4 @@
-// The digests that the tests of RSA verify signatures of.
+// The digests that the signatures in the RSA tests cover.
 #pragma once
 
 #include "crypto/rsa.h"

@@ -1,4 +1,4 @@
-// rsa_set_key, and what rsa_pkcs1_verify makes of the keys that it sets.
+// Tests rsa_set_key, and rsa_pkcs1_verify with the keys that rsa_set_key has set.
 #include "crypto/rsa.h"
 
 #include <gtest/gtest.h>

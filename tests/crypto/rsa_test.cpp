@@ -1,5 +1,5 @@
-// rsa_pkcs1_verify, with signatures by libcrypto, and with blocks made by hand and signed with only
-// the private operation.
+// Tests rsa_pkcs1_verify with signatures from libcrypto. Also with blocks made by hand, to which
+// only the private-key operation was applied.
 #include "crypto/rsa.h"
 
 #include <gtest/gtest.h>
@@ -171,7 +171,8 @@ TEST(RsaPkcs1Verify, EveryByteOfThePaddingCounts) {
   EXPECT_EQ(log.records(), kNoRecords);
 }
 
-// RFC 2313 §8.1 also defines the types 0 and 2, for the private key's operation and for encryption.
+// RFC 2313 §8.1 also defines block type 0, for private-key operations, and block type 2, for
+// public-key operations.
 TEST(RsaPkcs1Verify, BlockOfAnotherTypeThan1IsInvalidPadding) {
   const FixedKey key("rsa-1024");
   LogCapture log;
@@ -214,7 +215,7 @@ TEST(RsaPkcs1Verify, PaddingOfFewerThanEightBytesIsAccepted) {
   }
 }
 
-// Also of the greatest length, whose block ends where the verifier's buffer ends.
+// The block of the longer key ends where the verifier's buffer ends.
 TEST(RsaPkcs1Verify, PaddingWithoutASeparatorIsInvalid) {
   LogCapture log;
   for (const char* name : {"rsa-1024", "rsa-4096"}) {
@@ -225,8 +226,8 @@ TEST(RsaPkcs1Verify, PaddingWithoutASeparatorIsInvalid) {
   EXPECT_EQ(log.records(), kNoRecords);
 }
 
-// The verifier has just recovered a longer block in the same place. That block has a zero where the
-// padding of the shorter one ends.
+// The verifier recovers the longer block first, in the same place on the stack. That block has a
+// zero right after the place where the shorter block ends.
 TEST(RsaPkcs1Verify, PaddingThatRunsToTheLastByteIsNotReadBeyondIt) {
   const FixedKey longer("rsa-2048");
   const FixedKey shorter("rsa-1024");

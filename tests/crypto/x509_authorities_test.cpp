@@ -27,7 +27,7 @@ std::vector<std::string> CertificateFiles() {
   return files;
 }
 
-// The output of the command. If the command fails, some of it is missing.
+// The output of the command. If the command fails, the output may be incomplete.
 std::string OutputOf(const std::string& command) {
   FILE* pipe = popen(command.c_str(), "r");
   if (pipe == nullptr) return "";
@@ -66,7 +66,7 @@ Bytes DerOf(const std::string& file) {
   return der;
 }
 
-// The rest of the one line that begins with `start`; empty if no line does.
+// The rest of the first line that starts with `start`, or an empty text if no line does.
 std::string After(const std::vector<std::string>& lines, const std::string& start) {
   for (const std::string& line : lines) {
     if (line.compare(0, start.size(), start) == 0) return line.substr(start.size());
@@ -105,7 +105,7 @@ std::vector<std::string> NameLines(const x509_name& name) {
   return lines;
 }
 
-// The same, from the lines "    OID=#DER" that follow the line `title`.
+// Like NameLines, but from the indented lines "OID=#DER" that follow the line `title`.
 std::vector<std::string> OpensslNameLines(const std::vector<std::string>& lines,
                                           const std::string& title) {
   const std::map<std::string, int> types = {{"0.9.2342.19200300.100.1.25", 1},

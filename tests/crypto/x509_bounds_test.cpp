@@ -1,6 +1,6 @@
-// Elements that end beyond their containers, in bytes that would be valid there. Each certificate
-// would be read to its end if the element might use those bytes. Also the bytes that may follow the
-// last element that is read.
+// Tests elements that end beyond their containers. The bytes after the container would be valid as
+// the end of the element. A parser that used these bytes would therefore accept the certificate.
+// Also tests bytes after the last element that is read.
 #include <gtest/gtest.h>
 
 #include "crypto/parsed_certificate.h"
@@ -13,7 +13,7 @@ constexpr char kSubjectAltName[] = "2.5.29.17";
 constexpr char kBasicConstraints[] = "2.5.29.19";
 constexpr char kUnknown[] = "1.2.3.4";
 
-// The element with a length that is greater by `more` bytes. Both lengths have one octet.
+// Returns the element with a length that is greater by `more`. Both lengths have one octet.
 Bytes RunningOn(Bytes element, size_t more = 1) {
   EXPECT_LT(element[1] + more, 0x80u);
   element[1] = static_cast<uint8_t>(element[1] + more);
@@ -95,28 +95,29 @@ TEST(X509RunningOn, ElementsOfANameAreMinus12) {
   }
 }
 
-// The bytes that the element takes exist, but belong to the element around its container.
+// The bytes that the element would use exist, but they belong to the element around its container.
 TEST(X509RunningOn, ElementsOfANameMayNotTakeBytesAfterTheirContainer) {
   const Bytes type = der::Oid(kCommonName);
   const Bytes attribute = der::Sequence({type, Value()});
   const Bytes rdn = der::Set({attribute});
   ASSERT_EQ(ResultOf(WithSubject(der::Sequence({rdn, rdn}))), 0);
   const Bytes cases[] = {
-      // an attribute that takes the SET behind its own
+      // an attribute that includes the SET after its own
       der::Sequence({der::Set({RunningOn(attribute, rdn.size())}), rdn}),
-      // a value that takes the SET behind its own
+      // a value that includes the SET after its own
       der::Sequence({der::Set({der::Sequence({type, RunningOn(Value(), rdn.size())})}), rdn}),
-      // a value behind its SEQUENCE, in the SET
+      // a value after its SEQUENCE, in the SET
       der::Sequence({der::Set({der::Sequence({type}), Value()})}),
-      // a type behind its SEQUENCE, in the SET
+      // a type after its SEQUENCE, in the SET
       der::Sequence({der::Set({der::Sequence({}), type, Value()})}),
-      // a SEQUENCE behind its SET, in the name
+      // a SEQUENCE after its SET, in the name
       der::Sequence({der::Set({}), attribute}),
   };
   for (const Bytes& name : cases) EXPECT_EQ(ResultOf(WithSubject(name)), -12);
 }
 
-// The time lacks two bytes. The subject after it, of 90 bytes, begins with 30 5a: the text "0Z".
+// The second time lacks its end. The subject after it has 90 bytes of contents, so it starts with
+// 30 5a. As text, these bytes are "0Z".
 TEST(X509RunningOn, TimeIsMinus13) {
   Certificate certificate = WithSubject(Name({{kCommonName, std::string(79, 'x')}}));
   ASSERT_EQ(certificate.subject[0], '0');
@@ -141,7 +142,7 @@ TEST(X509RunningOn, KeyIsMinus14) {
   EXPECT_EQ(ResultOf(certificate), -14);
 }
 
-// All of it lies in the tbsCertificate, but not in the SEQUENCE that should contain it.
+// All elements are in the tbsCertificate, but not in the SEQUENCE that should contain them.
 TEST(X509RunningOn, KeyBehindItsInfoIsMinus14) {
   const Bytes algorithm = AlgorithmIdentifier("1.2.3");
   const Bytes key = der::BitString({1, 2, 3});
@@ -179,7 +180,8 @@ TEST(X509RunningOn, ElementsOfAnExtensionAreMinus15) {
   const Bytes value = der::OctetString(DigitalSignature());
   EXPECT_EQ(ResultOfExtensions({der::Sequence({der::Oid(kKeyUsage), value})}), 0);
   EXPECT_EQ(ResultOfExtensions({der::Sequence({der::Oid(kKeyUsage), RunningOn(value)})}), -15);
-  // After a flag of 04 the OCTET STRING is 04 04 03 02 05 a0.
+  // The header after the flag is read from the flag's own byte, 04, on. The OCTET STRING is
+  // therefore 04 04 03 02 05 a0.
   const Bytes id = Concat({der::Oid(kKeyUsage), der::Boolean(4)});
   const Bytes whole = FromHex("04 03 02 05 a0");
   const Bytes cut = FromHex("04 03 02 05");
@@ -206,7 +208,7 @@ TEST(X509RunningOn, ElementsOfAValueAreMinus15) {
   const Bytes ca = der::Boolean(0xff);
   const Bytes length = der::Integer(3);
   const auto result_of = [](const std::string& oid, const Bytes& sequence) {
-    // The byte that the element would take is part of the value, after the SEQUENCE.
+    // The byte that the element would use is part of the value, after the SEQUENCE.
     return ResultOfExtensions({Extension(oid, Concat({sequence, {0}}))});
   };
   EXPECT_EQ(result_of(kBasicConstraints, der::Sequence({ca, length})), 0);

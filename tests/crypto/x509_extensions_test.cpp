@@ -68,9 +68,9 @@ TEST(X509Extensions, FalseWrittenOutIsRefused) {
 
 TEST(X509Extensions, TrueOfAnotherByteIsReadAsAnIdentifier) {
   const Bytes value = der::OctetString(DigitalSignature());
-  // 0x01 starts a BOOLEAN. 0xdf, like 0xff, starts a long-form tag of the private class; 0x5f and
-  // 0x9f start one of the application and context-specific classes; 0x1f one of the universal
-  // class.
+  // 0x01 is the identifier octet of a BOOLEAN. The others start a long-form tag. Its class is
+  // private for 0xdf (as for 0xff), application for 0x5f, context-specific for 0x9f, and universal
+  // for 0x1f.
   const std::pair<uint8_t, int> cases[] = {
       {0x01, -15}, {0xdf, 0}, {0x5f, -15}, {0x9f, -15}, {0x1f, 0}};
   for (const auto& [flag, result] : cases) {
@@ -79,7 +79,8 @@ TEST(X509Extensions, TrueOfAnotherByteIsReadAsAnIdentifier) {
   }
 }
 
-// The two bytes and the OCTET STRING would read as a header of the private class and its value.
+// Read as a header, the two bytes of the flag and the OCTET STRING would be an element of the
+// private class with a good value.
 TEST(X509Extensions, FlagOfTwoBytesOnAnUnderstoodExtensionIsMinus15) {
   const Bytes rest = FromHex("04 03 02 05 a0");
   EXPECT_EQ(ResultOf(With({RawExtension(kKeyUsage, Concat({FromHex("01 01 04"), rest}))})), 0);
@@ -211,8 +212,9 @@ TEST(X509BasicConstraints, PathLengthMayStandAlone) {
 }
 
 TEST(X509BasicConstraints, MalformedIsMinus15) {
-  // No element; another element or class; a first element that is unreadable, neither flag nor
-  // number, of another class, or a flag of two bytes; a second element with one of the same faults.
+  // No element, another tag, another class. Then a first element that is unreadable, neither a
+  // BOOLEAN nor an INTEGER, of another class, or a BOOLEAN of two bytes or of none. Then a second
+  // element that is unreadable, of another tag or class, or again a BOOLEAN.
   for (const char* digits :
        {"", "31 00", "b0 00", "30 01 01", "30 02 05 00", "30 03 81 01 ff", "30 03 82 01 01",
         "30 04 01 02 ff ff", "30 02 01 00", "30 04 01 01 ff 02", "30 05 01 01 ff 05 00",

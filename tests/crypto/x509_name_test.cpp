@@ -69,7 +69,7 @@ TEST(X509Name, KnownAttributesAreKeptInOrderOfAppearance) {
 }
 
 TEST(X509Name, OtherAttributesAreSkipped) {
-  // Neighbours of the known object identifiers, shorter and longer ones.
+  // Object identifiers next to the known ones, and shorter and longer ones.
   const ParsedCertificate parsed(WithSubject(Name({{"2.5.4.2", "x"},
                                                    {"2.5.4.4", "x"},
                                                    {"2.5.4.5", "x"},
@@ -179,7 +179,7 @@ TEST(X509Name, MalformedNameIsMinus12) {
       der::Sequence({Rdn(kCommonName, Bytes())}),                  // no value
       der::Sequence({Rdn(kCommonName, {0x0c, 0x01})}),             // a value that runs past the end
       der::Sequence({Rdn(kCommonName, der::ContextPrimitive(12, {'x'}))}),  // of another class
-      der::Sequence({Rdn("1.2.3", der::ContextPrimitive(12, {'x'}))}),      // though unknown
+      der::Sequence({Rdn("1.2.3", der::ContextPrimitive(12, {'x'}))}),      // of an unknown type
   };
   for (const Bytes& name : cases) {
     Certificate certificate = Unsigned();
@@ -242,7 +242,8 @@ TEST(X509Time, BothTimesAreRead) {
 }
 
 TEST(X509Time, OtherLengthsAreMinus13) {
-  // Without seconds, with a fraction of one, with an offset, and each form labelled as the other.
+  // Without seconds, with a fraction of a second, with an offset, empty, and with the length of the
+  // other form. The UTCTime also with one digit too many.
   for (const char* text : {"2001020304Z", "200102030405.5Z", "200102030405+0100", "",
                            "20200102030405Z", "2001020304050Z"}) {
     NotBefore(der::kUtcTime, text, -13);

@@ -12,7 +12,7 @@ namespace {
 constexpr char kEcPublicKey[] = "1.2.840.10045.2.1";
 constexpr char kPrime256v1[] = "1.2.840.10045.3.1.7";
 
-// A certificate with a value in every field, for the tests that damage one.
+// A certificate with a value in every field, for the tests that damage a certificate.
 Certificate Full() {
   Certificate certificate = Unsigned();
   certificate.issuer =
@@ -270,8 +270,8 @@ TEST(X509Algorithm, ParametersOfAnotherKindAreLeftEmpty) {
 }
 
 TEST(X509Algorithm, MalformedSignatureAlgorithmIsMinus11) {
-  // No SEQUENCE, another class, an empty one, one without an OID, one that ends beyond its
-  // container.
+  // No SEQUENCE, another class, an empty SEQUENCE, a SEQUENCE without an OID, and a SEQUENCE that
+  // ends beyond its container.
   for (const char* digits :
        {"31 00", "70 03 06 01 2a", "30 00", "30 02 05 00", "30 84 7f ff ff ff"}) {
     Certificate certificate = Unsigned();

@@ -1,4 +1,4 @@
-// The fixture for tests of util/file.h: a directory for files, and answers that the kernel gives
+// The fixture for tests of util/file.h: a directory for files, and results that the kernel returns
 // for real files only by chance.
 #pragma once
 
@@ -11,7 +11,7 @@
 
 #include "support/files.h"
 
-// The answers that a test sets. The kernel itself answers if a test sets none.
+// The functions that a test replaces. A call of any other function goes to the kernel.
 struct Kernel {
   std::function<int(struct stat*)> fstat;
   std::function<off_t(int whence)> lseek;

@@ -1,5 +1,5 @@
-// ReadFile, OpenForReading and IsSameFile with real files, and with kernel answers that real files
-// give only by chance.
+// ReadFile, OpenForReading and IsSameFile with real files, and with results that the kernel returns
+// for real files only by chance.
 #include "util/file.h"
 
 #include <fcntl.h>
@@ -27,7 +27,7 @@ namespace {
 
 class FileTest : public FileFixture {
  protected:
-  // `path` cannot be read; only `message` is logged, and `out` is unchanged.
+  // Expects that `path` cannot be read, that only `message` is logged, and that `out` is unchanged.
   static void ExpectRefused(const std::string& path, const std::string& message) {
     LogCapture log;
     Bytes out = {1, 2, 3};
@@ -227,7 +227,7 @@ TEST_F(ReadFileTest, PiecewiseAndInterruptedReadsAreJoined) {
   Bytes out;
   EXPECT_TRUE(ReadFile(MakeFile("abcdefg"), out));
   EXPECT_EQ(ToBytes("abcdefg"), out);
-  // No read asks for more bytes than there is room for.
+  // No read requests more bytes than the rest of the buffer has.
   EXPECT_EQ(std::vector<size_t>({7, 7, 5, 5, 3, 3, 1, 1}), asked);
 }
 
@@ -264,7 +264,7 @@ TEST_F(ReadFileTest, DescriptorOfADirectoryHasNoSizeAndStaysOpen) {
   EXPECT_EQ(0, close(fd));
 }
 
-// ---- Its memory.
+// ---- The memory of the vector.
 
 // tests/apk/memory_test.cpp checks that the former memory is freed first.
 TEST_F(ReadFileTest, EmptyVectorGetsNoMoreMemoryThanTheFileNeeds) {
@@ -381,7 +381,7 @@ TEST(IsSameFile, EachPartOfTheStateCounts) {
   }
 }
 
-// Both states are equal, but not those of a regular file.
+// Both states are equal, but they are not of a regular file.
 TEST(IsSameFile, FilesThatAreNotRegularAreNotTheSame) {
   struct stat state = {};
   EXPECT_FALSE(IsSameFile(state, state));

@@ -1,4 +1,4 @@
-// GetFilenameByFd with real files, and with long paths that real files have only in odd places.
+// GetFilenameByFd with real files, and with long paths that real files rarely have.
 #include <fcntl.h>
 #include <gtest/gtest.h>
 #include <sys/stat.h>
@@ -39,8 +39,8 @@ TEST_F(GetFilenameByFdTest, ClosedDescriptorHasNoPath) {
   EXPECT_EQ(Records(), log.records());
 }
 
-// Nested directories, each made and opened from the one above, because the path of the last is
-// longer than a path may be. They are removed at the end.
+// Nested directories. Each is made and opened relative to its parent, because the full path may be
+// longer than the kernel accepts. The destructor removes them.
 class DeepDirectory {
  public:
   DeepDirectory(const std::string& top, size_t path_length) {
