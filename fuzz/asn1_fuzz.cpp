@@ -46,7 +46,7 @@ void ReadOid(const uint8_t* data, size_t size, size_t room) {
   CheckText(oid, room);
 }
 
-// The n-th bit of the string becomes bit n of the value, for the first 32.
+// Bit n of the string becomes bit n of the value, for the first 32 bits.
 void ReadBitString(const uint8_t* data, size_t size) {
   uint64_t expected = 0;
   for (size_t bit = 0; bit < 32 && 1 + bit / 8 < size; ++bit) {

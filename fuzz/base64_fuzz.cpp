@@ -1,4 +1,5 @@
-// apk/base64.h: any text, into any room, against a decoder that filters the text first.
+// apk/base64.h: decodes any text into a buffer of any size. A second decoder, which filters the
+// text first, must agree.
 #include "apk/base64.h"
 
 #include "fuzz/fuzz.h"

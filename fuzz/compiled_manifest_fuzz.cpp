@@ -1,6 +1,6 @@
-// apk/android_manifest.cpp: any bytes as the compiled Android manifest. They are put where memory
-// ends, because the platform's parser is not instrumented. A second reader converts every text to
-// UTF-8 and then compares it. Both readers must find the same.
+// apk/android_manifest.cpp: any bytes as the compiled Android manifest. They are placed right
+// before memory that cannot be read, because the platform's parser is not instrumented. A second
+// reader converts every text to UTF-8 and then compares it. Both readers must find the same facts.
 #include <androidfw/ResourceTypes.h>
 #include <utils/String8.h>
 
@@ -20,8 +20,8 @@ struct Facts {
   bool asks = false;
 };
 
-// A text that is longer than the wanted one by more than this many units is a different text, even
-// if the conversion drops some of them.
+// The conversion may drop UTF-16 units of a text. A text that is longer than the wanted one by more
+// than this many units is always a different text.
 constexpr size_t kMostDropped = 16;
 
 bool Is(const char16_t* text, size_t length, const std::string& wanted) {

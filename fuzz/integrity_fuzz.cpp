@@ -1,4 +1,4 @@
-// sign/integrity.h: any text in the integrity file, on a phone whose value settles in the end.
+// sign/integrity.h: any text in the integrity file, on a phone whose last value is settled.
 #include "sign/integrity.h"
 
 #include <algorithm>

@@ -16,7 +16,7 @@ using nlohmann::json;
 
 namespace {
 
-// True if the UTF-8 text has a character that a terminal would obey, apart from line ends.
+// True if the UTF-8 text has a hidden character (IsHidden) other than a line end.
 bool HasHidden(std::string_view text) {
   while (!text.empty()) {
     const size_t length = Utf8Length(text);

@@ -174,8 +174,8 @@ void MakeCompiledManifests() {
   Seed("compiled_manifest", "bad-node", CompiledXml().Start("manifest").BadNode().Build());
 }
 
-// The first byte selects the phone: 0 is a healthy one, 2 gives the file "user.zu", on 128 an
-// attacker exchanges libraries.
+// The first byte selects the phone. 0: a healthy phone. 2: the file has the attribute "user.zu".
+// 128: an attacker replaces libraries.
 void SeedPackage(const std::string& name, const PackageOptions& options, uint8_t phone = 0) {
   Seed("package", name, Concat({{phone}, MakePackage(options).Build()}));
 }

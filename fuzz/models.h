@@ -1,5 +1,5 @@
-// Second readers of the texts that the tool reads, written only to be compared with the tool's.
-// They cut the text into pieces; the tool walks over its bytes.
+// Second parsers for the texts that the tool parses. The fuzz targets compare their results with
+// the tool's. They cut the text into pieces, while the tool reads it byte by byte.
 #pragma once
 
 #include <cstdint>

@@ -20,7 +20,7 @@ struct Number : mpi_local {
   }
 };
 
-// The same in GMP.
+// The same number in GMP.
 class Expected {
  public:
   Expected() { mpz_init(value_); }
@@ -45,7 +45,7 @@ void RequireEqual(const mpi* number, Expected& expected, const char* what) {
   Require(actual == expected, what);
 }
 
-// Limbs that provoke errors of arithmetic: all bits set, none, and a few.
+// Limbs that provoke errors of arithmetic: all bits set, no bits set, or a few bits set.
 std::vector<uint32_t> Limbs(FuzzedDataProvider& input, size_t most) {
   constexpr uint32_t kEdges[] = {0, 1, 0xffffffff, 0x80000000, 0x7fffffff, 0xffff0000, 0x10000};
   std::vector<uint32_t> limbs(input.ConsumeIntegralInRange<size_t>(0, most));
@@ -172,7 +172,7 @@ void MontgomeryProduct(FuzzedDataProvider& input) {
   SetBelow(b, Limbs(input, n), expected_m, input.ConsumeBool() ? n + 1 : 1);
   t.Set(std::vector<uint32_t>(2 * (n + 1), 0x5a5a5a5a), 1);
 
-  uint32_t inverse = 1;  // of the lowest limb; each step doubles the number of right bits
+  uint32_t inverse = 1;  // of the lowest limb; each step doubles the number of correct bits
   for (int step = 0; step < 5; ++step) inverse *= 2 - modulus[0] * inverse;
   Expected expected(&a), factor(&b), radix;
   mpz_mul(expected.get(), expected.get(), factor.get());

@@ -1,6 +1,6 @@
-// The whole tool, from main() on, over any bytes as the package file, on a phone inside this
-// program. The first byte of the input selects the phone. A second reading of the same bytes judges
-// every signature and registration. Memory and descriptors are counted.
+// Runs the whole tool, from main() on, with any bytes as the package file, on a phone inside this
+// program. The first byte of the input selects the phone. A model (package_model.h) reads the same
+// bytes and judges every signature and registration. Memory and descriptors are counted.
 #include <dirent.h>
 #include <fcntl.h>
 #include <sanitizer/allocator_interface.h>
@@ -26,13 +26,13 @@
 #include "support/package.h"
 #include "support/phone.h"
 
-// sign/main.cpp, which this program is built with under that name.
+// The main() of sign/main.cpp, which is compiled under this name.
 int ToolMain(int argc, char* argv[]);
 
 namespace {
 
-// The limit of a run's peak memory: this many bytes for each byte of the archive and of the sizes
-// that its entries declare, and a fixed amount for everything else.
+// The limit of a run's peak memory: kBytesPerByte for each byte of the archive and for each byte
+// that its entries declare (DeclaredBytes), plus kBytesBesides.
 constexpr size_t kBytesPerByte = 16;
 constexpr size_t kBytesBesides = 1 << 20;
 
@@ -62,7 +62,7 @@ class Installation {
   const std::string& directory() const { return directory_; }
   std::string package() const { return directory_ + "base.apk"; }
 
-  // Replaces the library by another file. All are put back later.
+  // Replaces the library by another file. PutBack() restores all replaced libraries.
   void Exchange(const std::string& path) {
     const auto file = files_.find(std::filesystem::weakly_canonical(path).string());
     if (file == files_.end()) return;
@@ -117,7 +117,7 @@ std::string PathOf(int fd) {
   return std::filesystem::read_symlink("/proc/self/fd/" + std::to_string(fd)).string();
 }
 
-// Judges what the tool asked the phone for.
+// Judges each request of the tool to the phone.
 class Judge {
  public:
   Judge(const Bytes& archive, const Phone& phone) : archive_(archive), phone_(phone) {}
@@ -177,7 +177,8 @@ class Judge {
   std::optional<PackageModel> model_;
 };
 
-// Exchanges each library when it is opened for the second time, between its check and its signing.
+// Replaces each library when the tool opens it for the second time. This is between the check and
+// the signing of the library.
 class Attacker {
  public:
   void BeforeOpen(const std::string& path) {
@@ -214,7 +215,7 @@ void RunTool(const std::string& path) {
 
 }  // namespace
 
-// The tool never closes its archive, because its process ends. This process goes on, so it keeps
+// The tool never closes its archive, because its process ends. This process continues, so it keeps
 // the archives and closes them after each run.
 extern "C" {
 int32_t __real__Z13OpenArchiveFdiPKcPP10ZipArchiveb(int, const char*, ZipArchiveHandle*, bool);

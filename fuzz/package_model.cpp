@@ -31,13 +31,13 @@ struct PackageModel::Archive {
   Archive(const Archive&) = delete;
   Archive& operator=(const Archive&) = delete;
 
-  // Returns 0 if the archive has no such entry.
+  // Returns 1 if the archive has the entry, 0 if it does not, and -1 on any other error.
   int Find(const std::string& name, ZipEntry* entry) const {
     const int result = handle == nullptr ? -7 : FindEntry(handle, std::string_view(name), entry);
     return result == -7 ? 0 : result == 0 ? 1 : -1;
   }
 
-  // A stored entry must be as long as it declares. Otherwise it cannot be extracted.
+  // A stored entry cannot be extracted if its compressed and uncompressed lengths differ.
   std::optional<Bytes> Extract(ZipEntry entry) const {
     if (entry.method == kCompressStored && entry.compressed_length != entry.uncompressed_length) {
       return std::nullopt;

@@ -1,8 +1,9 @@
 // A model of the tool's decisions. The fuzz target for packages compares the tool's actions with
-// it. It reads the archive through the platform's zip library, as the tool does. It reads texts
-// with models.h, checks signatures with libcrypto, and compares digests. Two facts come from the
-// tool: the fields of the signature block (processCert), and the path at which a library is
-// installed. tests/crypto/pkcs7_test.cpp and tests/apk/native_libraries_test.cpp test them.
+// the model. The model reads the archive through the platform's zip library, as the tool does. It
+// reads texts with models.h, checks signatures with libcrypto, and compares digests. The tool's own
+// code finds two facts: the fields of the signature block (processCert), and the path at which a
+// library is installed. tests/crypto/pkcs7_test.cpp and tests/apk/native_libraries_test.cpp test
+// this code.
 #pragma once
 
 #include <map>
@@ -17,9 +18,10 @@ class PackageModel {
  public:
   explicit PackageModel(const Bytes& archive);
 
-  // The archive holds "AndroidManifest.xml".
+  // True if "AndroidManifest.xml" can be extracted from the archive.
   bool is_package() const { return is_package_; }
-  // The package is signed by `key`, and its manifest and classes.dex have the signed digests.
+  // True if the package is signed by `key`, and its manifest and classes.dex have the signed
+  // digests.
   bool is_good() const { return is_good_; }
   const Bytes& key() const { return key_; }
   // True if one of the archive's libraries is installed at `path`, for a package in `directory`
@@ -36,8 +38,8 @@ class PackageModel {
 
   bool Judge(const Archive& archive);
   bool IsListed(const std::string& name, const Bytes& content) const;
-  // True if the manifest has the digest in the first section of the signature file that has a
-  // manifest digest. If that section has several, the last one counts.
+  // True if the manifest has the digest that the signature file states. The first section with a
+  // manifest digest counts. If that section has several, its last one by name counts.
   static bool StatesDigestOf(const Bytes& manifest, const ManifestModel& signature_file);
   static bool IsDigest(const std::string& attribute, const Bytes& digest, const Bytes& content);
 

@@ -101,8 +101,9 @@ void EditText(ZipItem& item, const std::string& name, const std::string& suffix,
   item.data = ToBytes(text);
 }
 
-// Repairs, from the bottom up: the signatures (1), the manifest's digest (2), the entries' digests
-// (3).
+// Repairs the signatures if `depth` is at least 1, the manifest's digest if it is at least 2, and
+// the entries' digests if it is at least 3. The signatures come last, because they cover the
+// digests.
 void Repair(Items& items, unsigned depth) {
   const auto find = [&](const std::string& end) {
     return std::find_if(items.begin(), items.end(),

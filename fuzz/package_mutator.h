@@ -1,5 +1,6 @@
-// Mutations of whole packages that get past the first check. One entry is changed, some of the
-// digests and signatures over it are repaired, and the archive is built anew.
+// Mutations of whole packages that get past the first check. Up to three changes are made to the
+// entries. Some of the digests and signatures over the entries are repaired. Then the archive is
+// built again.
 #pragma once
 
 #include <cstddef>

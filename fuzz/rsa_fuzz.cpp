@@ -1,5 +1,5 @@
-// crypto/rsa.h: any key and signature. libcrypto computes the encoded message as well, and this
-// file computes the right answer a second time.
+// crypto/rsa.h: any key and signature. libcrypto also computes the encoded message. From this
+// message, the target computes the expected result.
 #include "crypto/rsa.h"
 
 #include <algorithm>
@@ -70,7 +70,7 @@ Bytes Take(FuzzedDataProvider& input, size_t size) {
 
 Case ReadCase(FuzzedDataProvider& input) {
   constexpr size_t kLengths[] = {15, 16, 34 + 3, 35 + 3, 51 + 3, 64, 65, 66, 128, 512, 513};
-  // With the exponent 1, the input writes the encoded message itself.
+  // With the exponent 1, the signature is the encoded message, so the input chooses its bytes.
   constexpr uint32_t kExponents[] = {1, 3, 17, 65537, 0, 2, 0x80000000, 0xffffffff, 0x7fffffff};
   const auto length = input.ConsumeBool() ? input.PickValueInArray(kLengths)
                                           : input.ConsumeIntegralInRange<size_t>(0, 140);

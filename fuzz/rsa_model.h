@@ -1,5 +1,5 @@
-// RSA PKCS#1 v1.5 (RFC 8017) by libcrypto's big numbers. It has the tool's rules where these are
-// more lenient than the standard: any exponent, any padding length.
+// RSA PKCS#1 v1.5 (RFC 8017), computed with libcrypto's big numbers. Where the tool's rules are
+// more lenient than the standard, the model has the tool's rules: any exponent, any padding length.
 #pragma once
 
 #include <cstdint>
@@ -7,8 +7,9 @@
 #include "support/certificate.h"
 
 // number ^ |exponent| mod modulus, in as many bytes as the modulus has. The exponent is a key's
-// 32-bit value, read as signed. The modulus must be odd, and the number below it.
+// 32-bit value, read as signed. The modulus must be odd, and the number must be less than the
+// modulus.
 Bytes PublicOperation(const Bytes& number, const Bytes& modulus, uint32_t exponent);
 
-// True if the signature is good for the data, over any of the three digests.
+// True if the signature is good for the data with MD5, SHA-1 or SHA-256.
 bool Verifies(const Bytes& modulus, uint32_t exponent, const Bytes& data, const Bytes& signature);

@@ -1,5 +1,5 @@
 // crypto/pkcs7.h up to ApkTools::Apk::VerifyCertificate: any bytes as the signature block of one
-// fixed signature file. Every other mutation is signed again.
+// fixed signature file. About half of the mutations are signed again.
 #include <cstring>
 #include <random>
 

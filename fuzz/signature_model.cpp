@@ -89,9 +89,9 @@ Bytes VerifiedKey(const pkcs7& record, const Bytes& block, const Bytes& signatur
   if (modulus.empty() || tbs.empty()) return {};
   uint32_t exponent;
   memcpy(&exponent, record.exponent, sizeof(exponent));
-  // With the exponent 1 or -1 anyone can make a signature for anyone.
+  // If the exponent is 1 or -1, anyone can forge the key's signatures.
   if (exponent == 1 || exponent == 0xffffffff) return {};
-  // A signature is read in the modulus's length. The length in the block is ignored.
+  // A signature is read with the length of the modulus. The length in the block is ignored.
   const bool good =
       Verifies(modulus, exponent, tbs, Copy(record.cert_signature, size, block)) &&
       Verifies(modulus, exponent, signature_file, Copy(record.signed_digest, size, block));

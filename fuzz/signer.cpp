@@ -18,7 +18,7 @@ namespace {
 
 using Context = std::unique_ptr<BN_CTX, void (*)(BN_CTX*)>;
 
-// The private exponent for a public exponent of the fuzz key; null if the key has none.
+// The private exponent for a public exponent of the fuzz key; null if there is no such exponent.
 Bignum PrivateExponent(uint32_t exponent) {
   const RSA* const key = TestRsaKey(kFuzzKey);
   const Context context(BN_CTX_new(), BN_CTX_free);
@@ -42,7 +42,7 @@ Bytes Sign(const Bytes& data, const BIGNUM* private_exponent, size_t size) {
   return signature;
 }
 
-// Copies `piece` to `place` if it fits in the block there.
+// Copies `piece` to `place`, a position in the block. Returns false if it does not fit there.
 bool Put(const Bytes& piece, const uint8_t* place, Bytes& block) {
   if (!LiesIn(place, piece.size(), block.data(), block.size())) return false;
   std::copy(piece.begin(), piece.end(), block.begin() + (place - block.data()));

@@ -1,6 +1,7 @@
-// The verdict on an invented run of an invented package, compared with the kernel's calls and
-// answers. The verdict must not name another key than the kernel got, nor call anything signed that
-// is not, nor leave out a failure. The shown text must not contradict it.
+// Compares the verdict on an invented run of an invented package with the kernel's calls and
+// answers. If the verdict says that the kernel got a key, the kernel must have got this key. The
+// verdict must call a thing signed only if the kernel signed it, and must report every failure. The
+// shown text must agree with the verdict.
 #include <algorithm>
 #include <sstream>
 #include <string>

@@ -1,6 +1,6 @@
-// The installed zip library under names that conflict with neither generation of its header:
-// zipstring_library.cpp includes the old one, installed_library.cpp the library's own. Codes, life
-// times and handles are the library's.
+// The functions of the installed zip library, under names that do not conflict with either
+// generation of its header. zipstring_library.cpp includes the old header, installed_library.cpp
+// the library's own header. Result codes, lifetimes and handles are those of the library.
 #pragma once
 
 #include <sys/types.h>

@@ -1,14 +1,15 @@
-// A library to be loaded before all others. It makes one call of one C library function fail,
-// counted from the start of main().
+// A library to be loaded before all others. It makes one call of one C library function fail. Calls
+// are counted from the start of main().
 //
 //   APKTOOLKIT_FAULT         the function's name, ":", and the number of its call, from 1
 //   APKTOOLKIT_FAULT_REPORT  a file that is made at that call
 //
-// Calls from the simulated phone's own libraries are passed on and not counted, except for memory.
+// Calls from the simulated phone's own libraries are passed on and not counted, except requests for
+// memory.
 //
-// The names are malloc, open, read, fopen, readlink, fgetxattr, fstatvfs and fcntl. A function
-// under several names (open, open64 and the checked __open_2) counts as one, and so do malloc,
-// calloc and realloc.
+// The names are malloc, open, read, fopen, readlink, fgetxattr, fstatvfs and fcntl. A function with
+// several names (open, open64 and the checked __open_2) counts as one function. malloc, calloc and
+// realloc also count as one function.
 #include <dlfcn.h>
 #include <fcntl.h>
 #include <signal.h>
@@ -37,7 +38,7 @@ void* __libc_realloc(void* block, size_t size);
 namespace {
 
 char function[32];
-long calls_left = -1;  // until the one that fails; below 0: none fails
+long calls_left = -1;  // including the one that fails; 0 or less: none fails
 const char* report = nullptr;
 
 // True if the code at `address` is part of the shared library whose path contains `name`.
@@ -47,8 +48,9 @@ bool IsIn(const char* name, const void* address) {
          strstr(info.dli_fname, name) != nullptr;
 }
 
-// Without memory, the platform's String8 uses a null pointer where its other containers abort. Here
-// it aborts, too, so that no other crash can look like this one.
+// If memory is missing, the platform's String8 uses a null pointer, while the platform's other
+// containers abort. This handler turns that crash into an abort, so that a test can tell it from
+// every other crash.
 void AbortForString8(int, siginfo_t*, void* context) {
 #ifdef __x86_64__
   const auto address = static_cast<ucontext_t*>(context)->uc_mcontext.gregs[REG_RIP];
@@ -155,7 +157,7 @@ extern "C" FILE* fopen64(const char* path, const char* mode) {
   return Fails("fopen", EMFILE, __builtin_return_address(0)) ? nullptr : next(path, mode);
 }
 
-// Reads a mode even if the caller passed none. It is then not used.
+// Reads a mode even if the caller passed none. The mode is then not used.
 extern "C" int open(const char* path, int flags, ...) {
   static auto* const next = NextFunction<int(const char*, int, ...)>("open");
   va_list arguments;

@@ -1,5 +1,6 @@
-// Makes each call under the tool fail, at each moment. The tool must end normally, or by the abort
-// of a container without memory. It must never get anything signed that was not verified.
+// Makes each call of the tool to certain C library functions fail, one per run. The tool must end
+// normally, or because a container without memory aborts. It must never get anything signed that
+// was not verified.
 #include <fcntl.h>
 #include <gtest/gtest.h>
 #include <signal.h>
@@ -23,8 +24,8 @@ using namespace simulator;
 
 namespace {
 
-// Sends standard error to a file while it lives. An abort prints its message there, hundreds of
-// times in a sweep.
+// Sends standard error to a file during the object's life. An abort prints its message there,
+// hundreds of times in a test.
 class KeptStandardError {
  public:
   explicit KeptStandardError(const std::string& path) : saved_(dup(STDERR_FILENO)) {
@@ -118,7 +119,8 @@ bool IsExit0(const ToolEnd& ending) {
   return ending.how == ToolEnd::How::kExited && ending.value == 0;
 }
 
-// The expected grants of runs in which the function's first call fails, its second, and so on.
+// The expected grants, one text per run. The function's first call fails in the first run, its
+// second call in the second run, and so on.
 using Runs = std::vector<std::string>;
 using Table = std::map<std::string, Runs>;
 
@@ -162,10 +164,10 @@ TEST(FaultsOfCalls, OnAGoodPackageCostTheirOwnStep) {
   ExpectRuns(file, "LPK",
              {{"open", {"", "PK", "PK"}},     // the package; the library to read it, to sign it
               {"read", {"PK"}},               // the library
-              {"fopen", {"PK", "LK"}},        // the own integrity value, before each signing
+              {"fopen", {"PK", "LK"}},        // the tool's integrity value, before each signing
               {"fcntl", {"PK", "PK", "LK"}},  // the library kept open; both signings
               {"readlink", {"PK", "LPK"}},    // the libraries' directory; a message
-              {"fstatvfs", {"LPK"}},          // a file system that counts as writable
+              {"fstatvfs", {"LPK"}},          // the file system then counts as writable
               {"fgetxattr", {}}});            // only JARs have attributes
 }
 
@@ -213,17 +215,17 @@ TEST(FaultsOfCalls, OnAnotherLibraryDoNotGetItSigned) {
 #define HAS_OWN_MALLOC false
 #endif
 
-// The sanitizer has its own memory, which does not fail.
+// The sanitizer has its own allocator, which the injector cannot make fail.
 #if !HAS_OWN_MALLOC
 
 bool IsAbort(const ToolEnd& ending) {
   return ending.how == ToolEnd::How::kKilled && ending.value == SIGABRT;
 }
 
-// Makes each request for memory fail, one per run. A run may end by the abort of a container. It
-// then keeps the earlier grants, which are never fewer than with an earlier request. Otherwise it
-// ends normally, with one of the given grants: the tool and its libraries cope with the missing
-// memory.
+// Makes each request for memory fail, one per run. A run may end with the abort of a container. The
+// grants are then the first letters of `all`, and never fewer than in an earlier run of this kind.
+// Any other run must end normally, with grants from `ways`: the tool and its libraries then handle
+// the missing memory.
 void ExpectRunsWithoutMemory(Installed& file, const std::string& all,
                              const std::set<std::string>& ways) {
   constexpr int kMostCalls = 20000;
@@ -250,9 +252,9 @@ void ExpectRunsWithoutMemory(Installed& file, const std::string& all,
 
 TEST(FaultsOfMemory, OnAGoodPackageCostTheLaterSteps) {
   Installed file = GoodPackage();
-  // Nothing verified; no stream for the integrity value, before either signing; no text for the
-  // permission or for the package's name, which then reads as empty; a request whose failure does
-  // not matter.
+  // In the order of the list: nothing is verified; no stream for the integrity value before the
+  // first signing, and before the second; no text for the permission; no text for the package's
+  // name, which is then empty; a request whose failure has no effect.
   ExpectRunsWithoutMemory(file, "LPK", {"", "PK", "LK", "LP", "LPN", "LPK"});
 }
 

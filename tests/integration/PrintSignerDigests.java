@@ -8,8 +8,8 @@ import java.util.List;
 
 /**
  * PrintSignerDigests LEVEL FILE [JAR-SIGNER]: prints the SignerDigests of the signers that the package
- * manager of this API level finds for the package; with a third word, prints whether that word is one
- * of them. Fails if the package manager would refuse the package.
+ * manager of this API level finds for the package. With JAR-SIGNER, instead prints "true" if it is one
+ * of these digests, else "false". Fails if the package manager would refuse the package.
  */
 public final class PrintSignerDigests {
     public static void main(String[] words) throws Exception {

@@ -62,7 +62,7 @@ TEST(RunProgram, KillsAProgramThatTakesTooLong) {
   const auto taken = std::chrono::steady_clock::now() - start;
   EXPECT_GE(taken, std::chrono::milliseconds(200));
   EXPECT_LT(taken, std::chrono::seconds(5));
-  EXPECT_EQ(waitpid(-1, nullptr, WNOHANG), -1);  // it is gone
+  EXPECT_EQ(waitpid(-1, nullptr, WNOHANG), -1);  // the child process is gone
 }
 
 TEST(RunProgram, LeavesAProgramThatEndsInTimeAlone) {
@@ -89,7 +89,7 @@ std::string Streams() {
 TEST(RunProgram, HasNullForItsStreamsAndNothingElseOpen) {
   const int inherited = open("/dev/null", O_RDONLY);  // without O_CLOEXEC
   EXPECT_EQ(Streams(), "/dev/null\n/dev/null\n/dev/null\n");
-  EXPECT_EQ(Printed("ls /proc/self/fd"), "0\n1\n2\n3\n");  // 3 is the listing's own
+  EXPECT_EQ(Printed("ls /proc/self/fd"), "0\n1\n2\n3\n");  // 3: the directory that ls reads
   close(inherited);
 }
 
@@ -103,7 +103,7 @@ TEST(RunProgram, HasItsStreamsEvenIfThisProcessHasNone) {
   EXPECT_EQ(streams, "/dev/null\n/dev/null\n/dev/null\n");
 }
 
-// A shell would unblock signals itself.
+// Runs cp, because a shell would unblock signals itself.
 TEST(RunProgram, HasNoSignalBlocked) {
   sigset_t some, before;
   sigemptyset(&some);

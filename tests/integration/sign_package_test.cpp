@@ -25,7 +25,7 @@ class Phone : public testing::Test {
     InstallProgram("apktoolkit-bound", std::string("exec '") + APKTOOLKIT_BOUND_PATH + "'");
   }
 
-  // Installs a script in place of a program. It passes on its arguments.
+  // Installs a script in place of a program. The script appends its own arguments to `command`.
   void InstallProgram(const std::string& name, const std::string& command) const {
     const std::string path = bin_.Write(name, ToBytes("#!/bin/sh\n" + command + " \"$@\"\n"));
     ASSERT_EQ(chmod(path.c_str(), 0700), 0);
@@ -35,7 +35,7 @@ class Phone : public testing::Test {
     return "exec '" + SimulatorPath() + "' --state '" + (data_ / "signed") + "' " + options;
   }
 
-  // Installs a golden package whose signers are those of its key.
+  // Installs a golden package. The package manager's only signer is the package's own signer.
   InstalledPackage Install(const std::string& name) const {
     fs::copy(Golden(name), data_ / name, fs::copy_options::recursive);
     return {data_ / (name + "/base.apk"), ContentOf(Golden(name) + "/digest").substr(0, 64)};

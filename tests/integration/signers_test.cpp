@@ -1,5 +1,5 @@
-// Binding the signers, on both sides: the package manager's signers, and whether apktoolkit finds
-// the same ones.
+// Binding the signers, on both sides. The Java side finds the package manager's signers. The C++
+// side checks that the JAR signer, which apktoolkit uses, is one of them.
 #include <gtest/gtest.h>
 
 #include <filesystem>
@@ -18,7 +18,7 @@ using Words = std::vector<std::string>;
 
 std::string Golden(const std::string& name) { return std::string(GOLDEN_PACKAGES) + "/" + name; }
 
-// openssl's digest of the modulus of the key, as make_golden_packages left it.
+// The digest of the key's modulus, which make_golden_packages computed with openssl.
 std::string DigestOfKey(const std::string& golden) {
   return ContentOf(Golden(golden) + "/digest").substr(0, 64);
 }
@@ -59,8 +59,8 @@ constexpr int kOtherSigner = 3;
 constexpr int kNoJarSigner = 4;
 constexpr int kNotStarted = 5;
 
-// A package with two different signers: the META-INF, dex and libraries are another's, below the
-// attacker's own signing block.
+// A package with two different signers. META-INF, the dex file and the libraries are a victim's.
+// The signing block is the attacker's.
 class PackageWithTwoFaces : public testing::Test {
  protected:
   PackageWithTwoFaces() : apk_(directory_ / "base.apk") {
@@ -113,7 +113,7 @@ INSTANTIATE_TEST_SUITE_P(Of, OneSigner,
                            return name;
                          });
 
-// The tool uses the first signature file, the package manager all signers of the block.
+// The tool uses the first signature file. The package manager uses all signers.
 TEST(Signers, OneOfSeveralIsEnough) {
   const std::string apk = Golden("two-signers/base.apk");
   const std::string digests = SignersOf(apk, 27);
@@ -123,7 +123,8 @@ TEST(Signers, OneOfSeveralIsEnough) {
   ExpectRun(DigestOfKey("openssl-cms-issued") + "," + DigestOfKey("apksigner-sha256-2048"), apk);
 }
 
-// From API level 28 on the package manager uses the new key. The JAR signature is the old key's.
+// From API level 28 on the package manager uses the new key. The JAR signature is made with the old
+// key.
 TEST(Signers, RetiredKeyIsNotASigner) {
   const std::string apk = Golden("rotated-key/base.apk");
   EXPECT_EQ(SignersOf(apk, 33), DigestOfKey("openssl-cms-issued"));
@@ -131,7 +132,7 @@ TEST(Signers, RetiredKeyIsNotASigner) {
   ExpectRun(SignersOf(apk, 27), apk);
 }
 
-// As in the tool: the signer of a leased package is read once the holder gives it up.
+// As in the tool, the signer of a leased package is read after the holder gives up the lease.
 TEST(Signers, OfALeasedPackageAreWaitedFor) {
   const TempDir directory;
   const std::string apk = directory / "base.apk";
@@ -188,10 +189,10 @@ TEST(Bound, LeavesNothingOpenForTheCommand) {
   const ProcessResult run =
       RunProcess({APKTOOLKIT_BOUND_PATH, DigestOfKey("apksigner-sha256-2048"), "/bin/sh", "-c",
                   "ls /proc/self/fd", Golden("apksigner-sha256-2048/base.apk")});
-  EXPECT_EQ(run.output, "0\n1\n2\n3\n");  // 3 is the listing's own
+  EXPECT_EQ(run.output, "0\n1\n2\n3\n");  // 3: the directory that ls reads
 }
 
-// Descriptor 3 is free, as when the tool is started directly, and the tool signs.
+// Descriptor 3 is free for the tool, as when the tool is started directly.
 TEST(Bound, HasTheToolSign) {
   const std::string apk = Golden("apksigner-sha256-2048/base.apk");
   const ProcessResult run = RunProcess({APKTOOLKIT_BOUND_PATH, DigestOfKey("apksigner-sha256-2048"),

@@ -5,8 +5,8 @@ in the simulated phone, and prints a table.
 FILES has the files of the runs, EXPECTED the simulator's journals. Each directory KERNEL has
 `results`, as tests/kernel/init left them, and `disk.img`. Fails if anything differs: an event (log
 record, reading of the integrity value, call to the kernel with payload, result and errno,
-registration, exit status), its place in the order, or a line of output. Fails also if a signed file
-on the disk does not hold its payload, or if the kernel complained.
+registration, exit status), its place in the order, or a line of output. Also fails if a signed file
+on the disk does not keep its payload, or if the kernel complained.
 """
 
 import difflib
@@ -24,8 +24,8 @@ PRIORITIES = {"V": 2, "D": 3, "I": 4, "W": 5, "E": 6, "F": 7}
 # The start of a record that the workstation's liblog writes to standard error: tag, priority, date,
 # time, two numbers.
 RECORD = re.compile(r"(\S+) ([VDIWEF]) \d\d-\d\d \d\d:\d\d:\d\d +\d+ +\d+ (.*)", re.S)
-# Events that only the simulator has. Output is compared separately, as it comes when the program
-# ends.
+# Events that only the simulator has. Output is compared separately, because programs write it only
+# when they end.
 OF_SIMULATION = {"journal", "start", "attached", "verdict", "stdout"}
 SEEN_BY_MODULE = {"integrity", "sign", "verify"}
 INFORMATION = 4  # the workstation's liblog drops records of a lower priority
@@ -49,7 +49,7 @@ class Kernel:
         self.verdicts = {}  # "same" or "DIFFERS", by the name of the run
 
     def events(self, run):
-        """All events without the output. The log's records are in their places among them."""
+        """All events without the output, with the log's records in their places."""
         events = []
         for line in (self.results / f"{run.name}.journal").read_text().split("\n")[:-1]:
             record = RECORD.fullmatch(line)
@@ -59,7 +59,7 @@ class Kernel:
                 events.append({"event": "log", "priority": PRIORITIES[record[2]], "tag": record[1],
                                "text": record[3]})
             elif events and events[-1]["event"] == "log":
-                # The record ends with a line end of its own, or continues after it.
+                # The text of a log record can have a line end within it or at its end.
                 events[-1]["text"] += "\n" + line
             else:
                 events.append({"event": "unknown", "text": line})
@@ -93,7 +93,7 @@ def compare(kernel, expected, run):
 
 
 def probe_answers(kernel, files, run):
-    """The results of the probe's calls, with errno."""
+    """Compares the results of the probe's calls, with errno."""
     wanted = (files / f"{run.file}.out").read_text().splitlines()
     found = (kernel.results / f"{run.name}.out").read_text().splitlines()
     if found != wanted:
@@ -110,8 +110,8 @@ def last_payloads(kernel, all_runs):
 
 
 def check_disk(kernel, files, all_runs):
-    """Each signed file keeps the digest of its bytes and its payload, as e2fsprogs reads them from
-    disk."""
+    """Checks that the disk keeps the digest and the payload of each signed file. e2fsprogs reads
+    both. Returns the number of signed files."""
     payloads = last_payloads(kernel, all_runs)
     with tempfile.TemporaryDirectory() as name:
         directory = pathlib.Path(name)
@@ -135,7 +135,7 @@ def check_disk(kernel, files, all_runs):
 
 
 def check_domain(kernel, all_runs):
-    """With a policy, each confined run was in the tool's domain."""
+    """With a policy, checks that each confined run was in the tool's domain."""
     entered = sum(bool(ENTRY.search(line)) for line in kernel.messages)
     confined = sum(run.confined for run in all_runs)
     if kernel.has_policy and entered != confined:

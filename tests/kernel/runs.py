@@ -2,8 +2,8 @@
 """The runs on the real kernel and in the simulated phone, for scripts/kernel.
 
 runs.py files DIRECTORY GOLDEN           makes the files for the runs
-runs.py simulate DIRECTORY BUILD OUT     runs all in the simulated phone: OUT/NAME.journal and, for the
-                                         guest, the same runs as a script: OUT/runs
+runs.py simulate DIRECTORY BUILD OUT     runs all in the simulated phone, with the journals OUT/NAME.journal.
+                                         Writes the same runs as a script for the guest: OUT/runs
 """
 
 import errno
@@ -21,16 +21,17 @@ GOOD = "golden/apksigner-sha256-2048"
 # The probe's calls (tests/simulator/phone/probe.cpp). The tool never makes them, but the simulated
 # kernel must answer them like a real one.
 PROBES = {
-    # Kernels trust the JARs of their own system. Here the probe signs them first.
+    # A product's kernel trusts the JARs of its system. Here the probe signs the JARs first, so that
+    # the kernel trusts them.
     "trust": ["open jars/trusted.jar", "sign 5 0000", "open jars/trusted-marked.jar", "sign 6 0000",
               "open jars/changed.jar", "sign 7 0000", "open jars/refused.jar", "sign 8 0000",
               "verify 5"],
     "calls": ["verify 3", "sign 3 0200abcd", "verify 3", "sign64 3 0000", "verify64 3",
-              # exactly as many bytes as the length says
+              # the kernel reads exactly as many bytes as the length says
               "sign 3 0100abcdef", "sign 3 d007" + "5a" * 2000,
               # memory that cannot be read, or ends within the payload
               "sign 3 null", "sign 3 wild", "sign 3 cut",
-              # descriptors that are not open, or that only name a file
+              # descriptors that are not open, or that only name a file (O_PATH)
               "sign 700 0000", "sign -1 0000", "sign 700 null", "verify 700", "verify -1",
               "name .", "sign 5 0000", "verify 5",
               # the commands beside the feature's own
@@ -47,9 +48,9 @@ class Run:
     """A run of a program for one file, on a phone that these options of apktoolkit-sim describe.
 
     before: a shell command that first changes the files, on the phone and in the simulation.
-    feature: whether the kernel has the feature; mount: how the files are mounted.
-    confined: on a kernel with a policy the run is in the tool's domain. The policy is for regular
-    files. It has no rules for the probe, which no product contains.
+    feature: True if the kernel has the feature. mount: how the files are mounted.
+    confined: True if the run is in the tool's domain on a kernel with a policy. The policy is for
+    regular files. It has no rules for the probe, which no product contains.
     """
 
     def __init__(self, name, file, *options, program=TOOL, before=None, feature=True, mount="rw",
@@ -141,7 +142,7 @@ def golden_names(directory):
 
 
 def simulate(run, directory, build, out):
-    """Runs it in the simulated phone. The journal goes to OUT/NAME.journal."""
+    """Runs the program in the simulated phone. The journal goes to OUT/NAME.journal."""
     if run.before:
         subprocess.run(run.before, shell=True, cwd=directory, check=True)
     command = [build / "bin/apktoolkit-sim", "--install=no", "--installer=off", "--json",

@@ -1,5 +1,5 @@
-// Lists a manifest whose sections are not sorted, and finds one. With the argument "hash" it uses
-// the C++ library's hash, which must be trapped.
+// Lists a manifest whose sections are not sorted, and finds one section. With the argument "hash",
+// uses the C++ library's hash instead, which must be trapped.
 #include <cstdio>
 #include <functional>
 #include <string>

@@ -3,7 +3,7 @@
 Tries try-on-phone with a stand-in for adb (tests/phone/adb), on phones that work and on phones
 that do not.
 
-PROGRAMS is the directory of the built programs, GOLDEN that of the golden packages.
+PROGRAMS is the directory of the built programs. GOLDEN is the directory of the golden packages.
 """
 
 import datetime
@@ -109,8 +109,8 @@ def check_metadata():
 
 
 def trial(programs, package, mood=""):
-    """Runs try-on-phone on a phone of its own. Returns its status, its output, and the files it
-    left."""
+    """Runs try-on-phone on a new phone. Returns its status, its output, and the files that it left
+    on the phone."""
     with tempfile.TemporaryDirectory() as name:
         phone = pathlib.Path(name) / "phone"
         built = pathlib.Path(name) / "system"

@@ -11,7 +11,7 @@ import tempfile
 
 from sources import ROOT, report
 
-# A program with a use for each part: a buffer on the stack, and a call whose room is known.
+# A program with a use for each part: a buffer on the stack, and a call with a buffer of known size.
 SOURCE = """#include <stdio.h>
 #include <string.h>
 int main(int count, char** words) {
@@ -25,7 +25,7 @@ int main(int count, char** words) {
 GOOD = {"bind": "-Wl,-z,now", "table": "-Wl,-z,relro", "place": "-pie -fPIE",
         "stack": "-fstack-protector-strong", "calls": "-D_FORTIFY_SOURCE=2", "heap": "-O2"}
 
-# The flag that removes a part, and the message about it.
+# A part, the flag that removes it, and the message about this.
 BAD = [("bind", "-Wl,-z,lazy", "binds its symbols when they are called"),
        ("table", "-Wl,-z,norelro", "is writable"),
        ("place", "-no-pie -fno-pie", "is not position-independent"),

@@ -16,8 +16,8 @@ DEFAULT_STANDARD = "gnu++14"
 
 
 class Blueprint:
-    """The modules of a file and its variables. A module is a dictionary, with its type under
-    "type"."""
+    """The modules and variables of a file. A module is a dictionary, which has the module's type
+    under "type"."""
 
     def __init__(self, path):
         self.path = path
@@ -93,7 +93,8 @@ class Tree:
                 *(f"-I{directory}" for directory in directories)]
 
     def with_defaults(self, module):
-        """The module with the properties of its defaults. Their lists come before its own."""
+        """The module with the properties of its defaults. The defaults' lists come before its
+        own."""
         merged = {}
         for part in [*map(self.with_defaults, self.named(module.get("defaults", []))), module]:
             for key, value in part.items():

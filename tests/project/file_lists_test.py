@@ -1,6 +1,7 @@
 #!/usr/bin/env python3
-"""Writes the file lists of the platform's build from CMake's, and compares the rest of the two: the
-warnings, the functions that the linker wraps for a test, and the words that Android 8.1 knows."""
+"""Writes the file lists of the platform's build from those of CMake. Compares other parts of the
+two builds: the warnings, and the functions that the linker wraps for a test. Also checks that
+Android 8.1 knows every word of the Android.bp files."""
 
 import json
 import pathlib
@@ -39,12 +40,13 @@ KNOWN_PROPERTIES = {"cflags", "compile_multilib", "cpp_std", "data", "defaults",
                     "srcs", "static_libs"}
 
 # The first flag is for headers that are system headers in CMake's build but not in the platform's.
-# The developers' presets set the second by a variable of CMake's own.
+# In CMake's build, the developers' presets set the second flag by a variable of CMake.
 PLATFORM_ONLY_FLAGS = {"-Wno-sign-conversion", "-Werror"}
 
 
-# The modules whose sources are those of targets in CMake, by file. A blueprint names paths that count
-# from its own directory, which is that of the CMakeLists.txt for all but the programs of integration/.
+# By blueprint: the modules whose sources come from targets of CMake, with these targets. A target
+# is DIRECTORY:NAME, or NAME in the root. In a blueprint, paths are relative to the blueprint's
+# directory.
 MODULES = {
     "Android.bp": {"apktoolkit_core": ["apktoolkit_core"], "apktoolkit": ["apktoolkit"],
                    "apktoolkit-verify": ["apktoolkit-verify"],
@@ -56,7 +58,7 @@ MODULES = {
                             for room in ROOMS if room != "verify"}},
     "fuzz/cc_fuzz.bp": {"apktoolkit_fuzz_support": ["fuzz:fuzz_support"]},
 }
-# More sources of a module. CMake has these in libraries of their own.
+# More sources of a module. CMake has them in separate libraries.
 MORE = {"apktoolkit_sign_test": ["tests/support/phone.cpp"]}
 
 FIX = f"the lists and tables at the head of {__file__}, or the file that is named above"

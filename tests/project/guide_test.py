@@ -1,8 +1,9 @@
 #!/usr/bin/env python3
-"""Runs what docs/guide.md shows, and writes what is printed.
+"""Runs the commands that docs/guide.md shows, and writes their output to the page.
 
-Arguments: the directory of the golden packages, and the words that start apktoolkit-sim. A last line of
-three dots stands for the lines that follow; a command with nothing else may print anything.
+Arguments: the directory of the golden packages, and the words that start apktoolkit-sim. A last
+line of three dots on the page stands for the lines that follow. A command may print anything if the
+page shows only this line.
 """
 
 import pathlib
@@ -18,8 +19,8 @@ PAGE = ROOT / "docs/guide.md"
 DIRECTORY = "/data/app/vault"  # replaces the path of this test's directory on the page
 BLOCK = re.compile(r"^```\n(\$ .*?)\n```$", re.M | re.S)
 
-# Texts that differ with each new certificate, and with each compiler of the library. Any value is
-# right on the page.
+# Texts that differ with each new certificate, and with each compiler of the library. The page may
+# have any value for them.
 VARIES = [(re.compile(r"certificate SHA-256 digest: [0-9a-f]{64}"), "certificate SHA-256 digest: *"),
           (re.compile(r"\(\d+ bytes\) verified"), "(* bytes) verified"),
           (re.compile(r"(signer CN=Example, RSA-2048, key ).*"), r"\1*")]
@@ -52,7 +53,7 @@ def settled(lines):
 
 
 def checked(block, shell):
-    """The block as it should be."""
+    """The block with the output that its commands have now."""
     lines = []
     for command, expected in shown_commands(block):
         shown = shell.run(command).stdout.replace(str(shell.directory), DIRECTORY).splitlines()

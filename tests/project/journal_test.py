@@ -21,7 +21,7 @@ SCHEMA = json.loads((ROOT / "docs/journal.schema.json").read_text())
 
 
 def runs(package, directory):
-    """Command lines of the simulator that between them provoke every event and every verdict."""
+    """Command lines of the simulator. Together they cause every event and every verdict."""
     directory = pathlib.Path(directory)
     jar = directory / "library.jar"
     with zipfile.ZipFile(jar, "w") as archive:
@@ -66,7 +66,7 @@ def main():
     problems += [f"no run had the event {kind}" for kind in kinds - {kind for kind, _ in seen}]
     known = set(SCHEMA["$defs"]["verdict"]["properties"]["verdict"]["enum"])
     problems += [f"no run had the verdict {verdict}" for verdict in known - verdicts]
-    # The schema must also refuse: it refuses every event that lacks one of its members.
+    # The schema must refuse every event that lacks one of its members.
     for event in seen.values():
         for member in event:
             poorer = {key: value for key, value in event.items() if key != member}

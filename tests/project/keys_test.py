@@ -1,7 +1,7 @@
 #!/usr/bin/env python3
 """Runs every command that makes a key in README.md, in docs/guide.md and on the manual page. Each
-certificate must be signed with SHA-256. The pages also tell what the JDKs choose by themselves.
-That is compared with the installed JDK, if it is one of those."""
+certificate must be signed with SHA-256. The pages also name the default algorithms of some JDKs.
+They are compared with those of the installed JDK, if it is one of these JDKs."""
 
 import re
 import subprocess
@@ -40,7 +40,8 @@ def page_problems():
         if not commands:
             problems.append(f"{page} shows no command that makes a key")
         for command in commands:
-            # keytool asks for these two unless they are given. Each may be given only once.
+            # keytool asks for the values of these two options if they are missing. Each option may
+            # be given only once.
             command = re.sub(r" -(dname|storepass) \S+| 2>.*", "", command)
             if (found := signature_algorithm(command)) != "sha256WithRSAEncryption":
                 problems.append(f"{page}: the certificate of {command} is signed with {found}")

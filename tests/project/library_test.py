@@ -19,7 +19,8 @@ MARK = "== next command"
 
 
 def prepare(directory, build, package):
-    """The page's directory: what a checkout has, the build tree, and the files that the page names."""
+    """Fills the page's directory with the examples, the build tree, and the files that the page
+    names."""
     shutil.copytree(ROOT / "examples", directory / "examples")
     (directory / "build").mkdir()
     (directory / "build/release").symlink_to(build)
@@ -29,7 +30,8 @@ def prepare(directory, build, package):
 
 
 def run(commands, directory, compiler):
-    """The output of each command. All run in one shell, until one fails."""
+    """Returns the output of each command, and the problems. Runs all in one shell, until one
+    fails."""
     script = "set -euo pipefail\n" + "\n".join(f"echo '{MARK}'; {command}" for command in commands)
     environment = {**os.environ, "HOME": str(directory), "CXX": compiler}
     result = subprocess.run(["bash", "-c", script], cwd=directory, env=environment, text=True,
@@ -41,7 +43,7 @@ def run(commands, directory, compiler):
 
 
 def page_problems(directory, compiler):
-    # The build tree that is tested is the one that the first command would make.
+    # The first command is left out: it makes a build tree, and this test has the tested one.
     blocks = re.findall(r"^```\n(\$ .*?)\n```$", (ROOT / "examples/README.md").read_text(), re.M | re.S)
     shown = [command for block in blocks for command in shown_commands(block)][1:]
     printed, problems = run([command for command, _ in shown], directory, compiler)
@@ -69,7 +71,7 @@ def header_problems(directory, compiler):
 
 def main():
     build, compiler, package = sys.argv[1:]
-    digest = (pathlib.Path(package) / "digest").read_text().strip()  # as openssl tells it
+    digest = (pathlib.Path(package) / "digest").read_text().strip()  # openssl computed it
     problems = []
     if digest not in (ROOT / "examples/README.md").read_text():
         problems.append(f"examples/README.md does not show the signer's digest, {digest}")

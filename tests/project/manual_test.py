@@ -17,7 +17,7 @@ from sources import ROOT, Shell, report
 
 
 def lint(page):
-    """mandoc's complaints, except that the project's other page is not installed."""
+    """mandoc's complaints, except those that a page of the project is not installed."""
     output = subprocess.run(["mandoc", "-T", "lint", page], capture_output=True, text=True)
     return [line for line in output.stdout.splitlines()
             if "referenced manual not found: Xr apktoolkit" not in line]

@@ -1,9 +1,10 @@
 #!/usr/bin/env python3
-"""Writes what docs/messages.md has from the sources: priority and files of each of the tool's messages,
-and the tables of the simulator's reasons. The codes in docs/journal.schema.json come from the same rows.
+"""Writes parts of docs/messages.md from the sources: the priority and files of each message of the
+tool, and the tables of the simulator's reasons. The codes in docs/journal.schema.json come from the
+same rows.
 
-By hand is what a message means. The test fails where a message has no entry, or an entry no message,
-and where the simulator looks for a text that the tool does not log.
+The explanation of each message is written by hand. The test fails if a message has no entry, if an
+entry has no message, or if the simulator looks for a text that the tool does not log.
 """
 
 import re
@@ -17,16 +18,16 @@ LITERALS = r'(?:"(?:[^"\\]|\\.)*"\s*)+'
 CALL = re.compile(r"\b(LogInfo|LogError|Fail)\(\s*(%s|k\w+)" % LITERALS)
 CONSTANT = re.compile(r"constexpr char (k\w+)\[\] =\s*(%s)" % LITERALS)
 
-# The priority of what each function writes, and what it puts before each text. Fail is
-# crypto/pkcs7.cpp's, and writes to standard output.
+# For each function that writes: the priority of its texts, and their prefix. Fail is a function of
+# crypto/pkcs7.cpp. It writes to standard output.
 WRITERS = {
     "LogInfo": ("Info", ""),
     "LogError": ("Error", ""),
     "Fail": ("", "CERT_PARCER [ERROR]: "),
 }
 
-# An entry of the page: "### `text`", then a paragraph that opens with its priority and its files, as in
-# "Error, `file`, `file`." These two words and lists come from the sources.
+# An entry of the page: "### `text`", then a paragraph that starts with the message's priority and
+# files, as in "Error, `file`, `file`." This start comes from the sources.
 ENTRY = re.compile(r"^### `(.*)`\n\n((?:(?:Info|Error), )?`[^`]+`(?:,\s`[^`]+`)*\.\s)?", re.M)
 
 
@@ -35,7 +36,7 @@ def joined(literals):
 
 
 def messages():
-    """For each text that the tool writes, how its entry opens."""
+    """For each text that the tool writes, the start of its entry's paragraph."""
     found = {}
     for path in tool_sources():
         source = without_comments((ROOT / path).read_text())
@@ -63,7 +64,8 @@ GROUPS = {"kNotLookedAt": "The tool did not look at the file",
           "kInstaller": "The installer of the phones",
           "kGate": "The gate: what the command line demands", "kWarning": "Warnings"}
 
-# Groups of causes that leave the chain from the key to the entries whole. All others must break it.
+# Groups whose causes need not break the chain from the key to the entries. reasons_problems() has
+# the other exceptions.
 UNBROKEN = {"kKernel", "kKey", "kInstaller", "kGate", "kWarning"}
 
 PAGE = ROOT / "docs/messages.md"
@@ -137,7 +139,7 @@ def log_problems(messages):
     return problems
 
 
-# A row of the starts of messages that the library makes reasons from.
+# A row of the library's table: the start of a message, and the reason for it.
 LIBRARY = ROOT / "library/verification.cpp"
 LIBRARY_TEXT = re.compile(r"\{(%s), Reason::k\w+\}" % LITERALS)
 

@@ -1,6 +1,6 @@
 #!/usr/bin/env python3
-"""Looks up what the docs name: tests, the files that they link, and on docs/architecture.md each function
-in its file."""
+"""Checks that what the docs name exists: the tests, the linked files, and each function that
+docs/architecture.md names in a file."""
 
 import re
 import sys
@@ -18,7 +18,8 @@ LINK = re.compile(r"\]\(([^)#:]+)(?:#[^)]*)?\)")
 
 PAGE = ROOT / "docs/architecture.md"
 PATH = r"\w[\w/]*/\w+\.(?:cpp|h|md|py)"
-# A stop of the picture, a row of the table, an answer.
+# The places where the page names a function and its file: a stop of the picture, a row of the
+# table, an answer.
 STOP = re.compile(rf"^[ |:v]*([\w:]+) +({PATH})", re.M)
 ROW = re.compile(rf"^\|[^|]*\| ([^|]*) \| ((?:`{PATH}`(?:, )?)+) \|$", re.M)
 ANSWER = re.compile(rf"`([\w:]+)`\s+in\s+`({PATH})`")

@@ -1,7 +1,7 @@
 #!/usr/bin/env python3
-"""Compares docs/porting.md with the sources: the interface, the modules of the blueprint, the example of a
-JAR's key block, and the directories of integration/, each of which it must link. Writes from the sources
-where libraries lie on disk, there and on the tool's manual page."""
+"""Compares docs/porting.md with the sources: the interface, the modules of the blueprint, the
+example of a JAR's key block, and the links to all directories of integration/. From the sources,
+writes the directories of installed libraries to docs/porting.md and to the tool's manual page."""
 
 import hashlib
 import re
@@ -37,7 +37,7 @@ def interface_problems():
 
 
 def key_block_problems():
-    """Python computes the example's four digests."""
+    """Compares the example's four digests with those that Python computes."""
     text = section("ZuNewCertificate(fd, name, data, length)")
     path = re.search(r"^`(/\S+)`:", text, re.M)[1]
     digests, current = [], path.encode()
@@ -57,7 +57,8 @@ def module_problems():
 
 
 def link_problems():
-    """Its own headings are there, and of integration/ nothing is left unnamed."""
+    """Checks the page's links to its own headings, and that it links every directory of
+    integration/."""
     headings = {re.sub(r"[^\w\- ]", "", title.lower()).replace(" ", "-")
                 for title in re.findall(r"^#+ (.*)$", PAGE, re.M)}
     problems = [f"docs/porting.md has no heading #{anchor}"

@@ -1,6 +1,6 @@
 #!/usr/bin/env python3
-"""Writes debian/changelog from CHANGES.md, and has scripts/release make releases of a repository with good
-and bad tags, in which stand-ins install nothing and build empty packages. Argument: the build's version.
+"""Writes debian/changelog from CHANGES.md. Runs scripts/release in a repository with good and bad
+tags, in which stand-ins install nothing and build no real packages. Argument: the build's version.
 """
 
 import os
@@ -38,7 +38,7 @@ class Repository:
             script.write_text(f"#!/bin/bash\n{content}\n")
             script.chmod(0o755)
         (directory / ".gitignore").write_text("/build/\n/gpg/\n/.gitconfig\n")
-        (directory / ".gitconfig").write_text("[tar]\n\tumask = user\n")  # the user's own wish
+        (directory / ".gitconfig").write_text("[tar]\n\tumask = user\n")  # a setting of the user
         self.run("gpg", "--batch", "--quiet", "--passphrase", "", "--quick-generate-key",
                  "A <a@example.com>", "ed25519", "sign")
         self.run("git", "init", "--quiet")

@@ -1,13 +1,14 @@
 #!/usr/bin/env python3
-"""Reads the JUnit reports and SARIF logs of real runs, of odd names as well.
+"""Reads the JUnit reports and SARIF logs of real runs, also of files with odd names.
 
 Arguments: the directory of the golden packages, and the words that start apktoolkit-sim.
 
-The reader of JUnit reports is junitparser. A SARIF log is held against SARIF below: of the standard
-(OASIS, SARIF 2.1.0) it has the objects and properties that the simulator writes, each with the
-constraints of its section: types, required properties, enumerated values, least lengths and ranges,
-and items that may not stand twice. A property that is not in it is an error, so that none is written
-unread. Of what no schema can say, the test has the indices (§3.4.5, §3.52.4) and the URIs (§3.4.3).
+junitparser reads the JUnit reports. A SARIF log is checked with the schema SARIF below. The schema
+has the objects and properties of the standard (OASIS, SARIF 2.1.0) that the simulator writes. It
+has the constraints of their sections: types, required properties, enumerated values, minimum
+values, and unique items. Any other property is an error, so that the simulator writes no unchecked
+property. A schema cannot express all rules; the test itself checks the indices (§3.4.5, §3.52.4)
+and the URIs (§3.4.3).
 """
 
 import json
@@ -73,7 +74,8 @@ def run(simulator, directory, options, files):
 
 
 def junit_problems(verdicts, suites):
-    """Each file has a case, which passes where the status is 0, and fails where something was refused."""
+    """Checks that each file has a case. The case passes with status 0, fails with status 1, and
+    otherwise is an error."""
     cases = [case for suite in suites for case in suite]
     problems = [] if len(cases) == len(verdicts) else [f"{len(verdicts)} files, {len(cases)} cases"]
     for verdict, case in zip(verdicts, cases):
@@ -91,7 +93,7 @@ def junit_problems(verdicts, suites):
 
 
 def sarif_problems(verdicts, log):
-    """The log is as the standard has it, and has what the verdicts have."""
+    """Checks that the log follows the standard and agrees with the verdicts."""
     problems = [f"{error.json_path}: {error.message}"
                 for error in jsonschema.Draft202012Validator(SARIF).iter_errors(log)]
     (made,) = log["runs"]
@@ -116,7 +118,7 @@ def sarif_problems(verdicts, log):
 
 
 def odd_files(package, directory):
-    """Copies of a package under names with everything in them that XML, JSON and URIs give a meaning."""
+    """Copies of a package, under names with characters that are special in XML, JSON or URIs."""
     for name in (b"a b&<>\"'.apk", b"]]>.apk", b"http:x?a#b%41.apk", b"line\nend\x01.apk", b"\xe9\xff.apk",
                  "\u202egr\u00fcn\ufffe\U0001f600.apk".encode()):
         path = directory / name.decode(errors="surrogateescape")

@@ -2,7 +2,7 @@
 result.
 
 These tests compare tables in the docs with the sources. With --write as its first argument, a test
-writes its tables anew instead. A test that fails prints the command to run or the file to fix.
+rewrites its tables instead. A test that fails prints the command to run or the file to fix.
 """
 
 import difflib
@@ -71,7 +71,7 @@ def report(problems, fix="", pages=None):
     """Prints the problems and how to fix them. Returns the exit status of the test.
 
     `fix`: the file or the command that fixes the problems. `pages`: a map from the path of each page
-    with generated parts to its right text.
+    with generated parts to its correct text.
     """
     problems, stale = list(problems), {path: right for path, right in (pages or {}).items() if path.read_text() != right}
     for path, right in stale.items():

@@ -19,7 +19,7 @@ FIX = "the table at the head of scripts/check, a function below it, and groups_o
 
 
 def listed_steps():
-    """Each step of scripts/check, with what its table says of it."""
+    """Each step of scripts/check, with its text in the table there."""
     table = re.search(r"^steps='\n(.*?)\n'$", (ROOT / "scripts/check").read_text(), re.M | re.S)
     return dict(line.split(maxsplit=1) for line in table[1].splitlines())
 
@@ -29,7 +29,7 @@ def everyday_steps():
 
 
 def page_with_steps():
-    """docs/testing.md, with its table as scripts/check has it."""
+    """The text of docs/testing.md, with the table from scripts/check."""
     everyday = everyday_steps()
     rows = "".join(f"| `{step}`{' *' if step in everyday else ''} | {text} |\n"
                    for step, text in listed_steps().items())
@@ -49,7 +49,7 @@ def known_to_setup():
 
 
 def setup_problems():
-    """scripts/setup knows every step that it is called with."""
+    """Checks that scripts/setup knows every step that a script calls it with."""
     asked = {("scripts/check", step) for step in listed_steps()}
     for path in (ROOT / "scripts").iterdir():
         asked |= {(path.name, word) for words in re.findall(r"^ *scripts/setup ([\w ]+)$",
@@ -60,7 +60,8 @@ def setup_problems():
 
 
 def list_problems():
-    """Every step is a function, in the same order, and README.md shows the everyday ones."""
+    """Checks that every step has a function, in the same order, and that README.md shows the
+    everyday steps."""
     functions = re.findall(r"^step_(\w+)\(\)", (ROOT / "scripts/check").read_text(), re.M)
     shown = re.findall(r"^([a-z]\w+) .*build/logs", part("README.md", r"\$ scripts/test", "```"), re.M)
     return [f"{what}: {found} in place of {expected}"
@@ -75,7 +76,7 @@ def check(directory, *steps):
 
 @contextlib.contextmanager
 def scripts(name):
-    """A directory with a copy of this script alone."""
+    """A directory with only a copy of this script."""
     with tempfile.TemporaryDirectory() as directory:
         (pathlib.Path(directory) / "scripts").mkdir()
         shutil.copy(ROOT / "scripts" / name, pathlib.Path(directory) / "scripts")
@@ -88,7 +89,8 @@ def write(path, content):
 
 
 def run_problems():
-    """What scripts/check makes of steps that end in every way."""
+    """Checks the output and the status of scripts/check for steps that pass, fail and are
+    skipped."""
     with scripts("check") as directory:
         write(directory / "scripts/setup", "true")
         write(directory / "scripts/check-arrows", "echo arrow; echo all 3 are allowed")
@@ -119,7 +121,8 @@ def run_problems():
 
 
 def skip_problems():
-    """scripts/kernel and scripts/bare-system say why they cannot run here, and by their status that they did not."""
+    """Checks that scripts/kernel and scripts/bare-system print the reason and end with 77 if they
+    cannot run."""
     needs_root = "only root can make a bare system"
     for script, setup, reason in (
             ("kernel", "[[ $1 != emulator ]]", "qemu is missing, and apt-get cannot install it"),

@@ -1,6 +1,6 @@
 #!/usr/bin/env python3
-"""Runs the commands of docs/store.md over a few hundred packages on this machine, kills all of it in
-the middle, and takes it up again: nothing may be lost, and nothing may be there twice.
+"""Runs the commands of docs/store.md over a few hundred packages on this machine. Kills all of the
+work in the middle, and continues it. No result may be lost, and none may be there twice.
 
 Arguments: the directory of the golden packages, and the words that start apktoolkit-sim.
 """
@@ -21,17 +21,17 @@ from sources import ROOT, Shell, report
 PAGE = ROOT / "docs/store.md"
 BLOCK = re.compile(r"^```\n(\$ .*?)\n```$", re.M | re.S)
 
-# Package, verdict, and how many of them.
+# Package, verdict, and number of copies.
 PACKAGES = [("apksigner-sha256-2048/base.apk", "signed", 150), ("unsigned.apk", "refused", 90),
             ("foreign-manifest/base.apk", "not-installable", 60)]
-# The page speaks of large lists and of several machines; here the lists are many and the machine is
-# this one.
+# The page uses long lists of packages and several machines. This test uses short lists and only
+# this machine.
 HERE = [("--lines=200", "--lines=20"), ("8/:\n16/worker1\n16/worker2\n", "2/:\n")]
 LISTS = 15
 
 
 def commands():
-    """The commands of the page, in order, as they are for this machine."""
+    """The commands of the page, in order, changed for this machine."""
     text = PAGE.read_text()
     for there, here in HERE:
         if there not in text:
@@ -42,13 +42,14 @@ def commands():
 
 
 def prepare(golden, directory):
-    """The store; returns the number of packages of each verdict."""
+    """Makes the store. Returns the number of packages of each verdict."""
     number = 0
     for source, _, count in PACKAGES:
         for _ in range(count):
             place = directory / f"store/{number % 7}"
             place.mkdir(parents=True, exist_ok=True)
-            # A name with a blank and one with a line end, as anybody may upload them.
+            # One name has a blank and one has a line end, because uploaded files may have such
+            # names.
             name = {3: "a b.apk", 5: "two\nlines.apk"}.get(number, f"{number}.apk")
             shutil.copy(golden / source, place / name)
             number += 1
@@ -56,7 +57,7 @@ def prepare(golden, directory):
 
 
 class Store(Shell):
-    """Its commands can be killed, and leave their journals in its directory."""
+    """A shell whose commands can be killed. They write their journals to its directory."""
 
     def __init__(self, directory, simulator):
         super().__init__(directory, simulator)
@@ -68,7 +69,7 @@ class Store(Shell):
                                 stderr=subprocess.PIPE, text=True, start_new_session=True)
 
     def run(self, command):
-        """What the command prints; a complaint or a failure is a problem."""
+        """Returns the command's output, and the problems: a failure, or text on standard error."""
         process = self.start(command)
         output, errors = process.communicate()
         problems = []
@@ -77,12 +78,12 @@ class Store(Shell):
         return output, problems
 
     def journals(self):
-        """The lists that are done."""
+        """The names of the lists that are done."""
         return sorted(path.name for path in (self.directory / "journals").glob("??????"))
 
 
 def kill_session(leader):
-    """Kills all that was started from this process, as a machine does that is switched off."""
+    """Kills every process of the leader's session, as if the machine were switched off."""
     for entry in pathlib.Path("/proc").glob("[0-9]*"):
         try:
             session = int((entry / "stat").read_text().rsplit(")", 1)[1].split()[3])
@@ -94,7 +95,7 @@ def kill_session(leader):
 
 
 def run_and_kill(shell, command):
-    """Kills the work once some lists are done; returns the problems."""
+    """Kills the work after some lists are done. Returns the problems."""
     process = shell.start(command)
     while process.poll() is None and len(shell.journals()) < 4:
         time.sleep(0.05)
@@ -109,14 +110,15 @@ def run_and_kill(shell, command):
 
 
 def is_whole(shell, name):
-    """Whether the journal has a verdict for each package of its list."""
+    """True if the journal has a verdict for each package of its list."""
     lines = (shell.directory / "journals" / name).read_text().splitlines()
     verdicts = sum(line.startswith('{"event":"verdict"') for line in lines)
     return verdicts == (shell.directory / "batches" / name).read_bytes().count(b"\0")
 
 
 def cut_journal_problems(shell):
-    """A journal that the disk had no room for does not get the name of its list."""
+    """Checks that a journal that was cut off, as by a full disk, does not get the name of its
+    list."""
     command = shell.directory / "bin/apktoolkit-sim"
     whole = command.rename(command.with_name("whole"))
     command.write_text(f'#!/bin/sh\n{whole} "$@"; status=$?\nfor last; do :; done\n'
@@ -142,7 +144,7 @@ def check(directory, simulator, expected):
         problems += found
     again = [name for name, when in first.items()
              if (directory / "journals" / name).stat().st_mtime_ns != when]
-    if len(again) > 2:  # a job may have ended before parallel wrote it down, one for each worker
+    if len(again) > 2:  # one job of each worker may have ended before parallel recorded it
         problems.append(f"these lists were done, and were run again: {again}")
     counts = [output for command, output in printed.items() if "group_by" in command]
     if [json.loads(text) for text in counts] != [expected]:

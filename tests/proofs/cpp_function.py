@@ -1,15 +1,15 @@
-"""Runs functions of the tool's sources, as they stand there, on values of Python's.
+"""Runs functions of the tool's sources, unchanged, on Python's values.
 
-A function's statements are translated into Python's, which for the arithmetic that is proved here
-read almost alike. A value may be a Word: a term of z3's that stands for every value of its type; a
-comparison of such a value splits the run into one for each answer that is possible.
+The statements of a function are translated into Python. For the arithmetic that is proved here, C++
+and Python look almost the same. A value may be a Word: a term of z3 that stands for every value of
+its type. A comparison of a Word splits the run: there is one run for each possible answer.
 
-The dialect. A function that is read here has these forms and no others:
+The dialect. A function that is read here may have only these forms:
 
   declaration  const TYPE name = value;  TYPE name = value;  TYPE name;  TYPE name[n], name[n];
                TYPE is uint32_t, uint64_t, int, bool, auto or lanes, perhaps with *. A narrower type
-               would cut its value, which no proof would see. `constexpr` goes as `const` does, and a
-               typedef is passed over.
+               would truncate its value, and no proof would notice this. `constexpr` is treated like
+               `const`. A typedef is ignored.
   statement    name = value;  also with += -= |= <<= >>=, to name, *name, name[i] or name->name;
                ++name;  --name;  memcpy(&to, from, sizeof(to));  continue;  break;  return value;  a call.
   block        if (condition) and for (one; two; three), with a block or one statement. No else,
@@ -18,9 +18,10 @@ The dialect. A function that is read here has these forms and no others:
                true, false; *name, &name in a call, name[i], name->name, calls; static_cast to one of
                the types above. A Word has + - * / << >> & | < and ==.
 
-Constants of the file that are made of numbers are known, all others are given to load(). Comments and
-lines of the preprocessor are passed over. Anything else ends the proof with an Unread, which names the
-line. Then write that line in the dialect, or add its form here, to the list and to the translation.
+Constants of the file that consist of numbers are known. All others must be passed to load().
+Comments and preprocessor lines are ignored. Any other form ends the proof with an Unread, which
+names the line. Then write that line in the dialect, or add its form here, to the list and to the
+translation.
 """
 import pathlib
 import re
@@ -88,7 +89,7 @@ class Word:
 
 
 class Answer(Word):
-    """The result of a comparison: a number, 0 or 1, and a decision if the run depends on it."""
+    """The result of a comparison: the number 0 or 1. It splits the run if the run depends on it."""
 
     runs = None
 
@@ -101,8 +102,8 @@ class Answer(Word):
 
 
 class Runs:
-    """All possible runs of `function` under `assumptions`. Iterating gives, for each run, its
-    conditions and its result."""
+    """All possible runs of `function` under `assumptions`. The iterator returns the conditions and
+    the result of each run."""
 
     def __init__(self, function, assumptions, most=20):
         self.function, self.assumptions, self.most = function, assumptions, most
@@ -168,7 +169,7 @@ def code(path):
 
 
 def load(path, name, **constants):
-    """The function `name` of the source file, as one of Python's, whose globals are the constants
+    """The function `name` of the source file, as a Python function. Its globals are the constants
     of the file that are numbers, and `constants`."""
     text = code(path)
     scope = {"Pointer": Pointer, **constants}
@@ -208,8 +209,8 @@ TYPE = rf"(?:const )?{TYPE_NAME}\b ?\*?"
 
 
 def statements(body, path, first):
-    """The lines of a function's body in Python, each of which is indented by one space a block; before
-    each the number of its line in the source file, where the body begins with the line `first`."""
+    """Yields the lines of a function's body in Python, indented by one space per block. Each line
+    comes with its line number in the source file, in which the body begins at the line `first`."""
     body = re.sub(r"\bif \((.*)\) (\w[^{;]*;)", r"if (\1) {\2}", body)
     body = re.sub(r"\b(for \(.*?;.*?;.*?\)) ([\w*][^{;]*;)", r"\1 {\2}", body)
     steps = []
@@ -264,7 +265,7 @@ def simple(text):
 def expression(text):
     text = re.sub(rf"static_cast<{TYPE_NAME}>", "", text)
     text = re.sub(r"(?<![\w)\]] )(?<![\w)\]])\*(\w+)", r"\1[0]", text)  # what a pointer points at
-    text = re.sub(r"&(\w+)(?=[,)\[])", r"\1", text)  # an address that a call is given
+    text = re.sub(r"&(\w+)(?=[,)\[])", r"\1", text)  # an address that is passed to a call
     for cpp, python in (("->", "."), ("std::", ""), ("&&", " and "), ("||", " or "),
                         (" / ", " // "), ("false", "False"), ("true", "True")):
         text = text.replace(cpp, python)

@@ -18,7 +18,7 @@ def word(name, bits=LIMB_BITS):
 
 
 def wide(value):
-    """The number with room for sums of products of two limbs."""
+    """The number, with enough bits for sums of products of two limbs."""
     term = value.term if isinstance(value, Word) else value
     return z3.ZeroExt(72 - term.size(), term)
 
@@ -43,7 +43,7 @@ def multiply_add_equals_the_wide_product_plus_both_addends():
     halves = {(x, n): (y >> (16 * n)) & HALF for x, y in (("s", s), ("b", b)) for n in (0, 1)}
     products = {}
 
-    # The product of a half of s and a half of b: any number up to the greatest product.
+    # The product of a half of s and a half of b. It may be any number up to the greatest product.
     def product(left, right):
         m = next(n for n in (0, 1) if is_same(left, halves["s", n]))
         n = next(n for n in (0, 1) if is_same(right, halves["b", n]))
@@ -86,7 +86,7 @@ def half_digit_is_quotient_and_remainder():
         return function(place, half, d), place[0]
 
     Word.quotient, Word.product = quotient, product
-    # The dividend is rest * 2^16 + next. Less estimate * d, it is left * 2^16 + next - to_take.
+    # The dividend is rest * 2^16 + next. Minus estimate * d, it is left * 2^16 + next - to_take.
     difference = (wide(left) << 16) + wide(half) - wide(to_take)
     for holds, (digit, remainder) in Runs(run, given):
         less = wide(estimate) - wide(digit)
@@ -139,8 +139,9 @@ class Montgomery:
 
 def windows_make_up_the_exponent():
     """After every window, and after every zero between windows, the scan is in its first state
-    again. The exponents checked here hold each window of up to 6 bits, with every possible gap
-    to the next, and therefore stand for all. Some windows lie across limbs."""
+    again. The exponents that are checked here contain each window of up to 6 bits, with every
+    possible gap to the next window. They therefore stand for all exponents. Some windows cross
+    limbs."""
     function = load("crypto/mpi_pow_mod.cpp", "raise", kMpiLimbBits=LIMB_BITS,
                     mpi_msb=lambda number: number.value.bit_length())
     for w in (1, 3, 4, 5, 6):
@@ -161,7 +162,8 @@ def no_limb_is_held_in_anything_wider():
 
 
 def line_outside_the_dialect_is_named():
-    """A change that the translation cannot follow must end a proof, and say where."""
+    """A line that the translation does not know must end the proof, and the error must name the
+    line."""
     for line in ("const uint16_t cut = static_cast<uint16_t>(a);", "while (a < 3) ++a;", "a = a ? 1 : 2;",
                  "if (a == 1) { return a; } else { a = 2; }", "a = unknown(a);"):
         with tempfile.NamedTemporaryFile("w", suffix=".cpp") as source:
@@ -190,7 +192,7 @@ def main():
         try:
             proof()
             print(f"proved: {name}", flush=True)
-        except Exception as error:  # any error means that it is not proved
+        except Exception as error:  # any error means that the claim is not proved
             print(f"NOT PROVED: {name}: {error!r}", flush=True)
             status = 1
     return status

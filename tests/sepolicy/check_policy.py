@@ -3,7 +3,8 @@
 of release. Compares the permissions that it grants with the list below: it must grant exactly
 these.
 
-m4, checkpolicy, secilc and setfiles are Debian's. Rules that must be refused are compiled, too.
+m4, checkpolicy, secilc and setfiles are Debian's. The compilation must fail with each rule of
+REFUSED.
 """
 
 import pathlib
@@ -16,7 +17,8 @@ HERE = pathlib.Path(__file__).resolve().parent
 KIT = HERE.parents[1] / "integration/sepolicy"
 ALLOW = re.compile(r"\(allow (\S+) (\S+) \((\S+) \(([^)]*)\)\)\)")
 
-# By API level: the product's definitions for m4, and the words that the policy does not know there.
+# By API level: the product's definitions for m4, and the words that the policy of this level does
+# not know.
 LEVELS = {27: (["-Dapktoolkit_level=27"], {"map", "system_file_type"}),
           28: (["-Dapktoolkit_level=28"], {"system_file_type"}),
           29: ([], set()),

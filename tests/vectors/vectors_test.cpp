@@ -24,7 +24,7 @@ using nlohmann::json;
 
 // Flags of vectors where the tool's rules differ. The first is the project's own: these vectors are
 // invalid by the standard and accepted on purpose. The second is Wycheproof's: the signature is
-// made over another digest than the key is for. The tool accepts any digest that it knows, because
+// made with another digest than the key is for. The tool accepts any digest that it knows, because
 // the signature itself names its digest.
 constexpr char kAcceptedShortPadding[] = "AcceptedShortPadding";
 constexpr char kWrongHash[] = "WrongHash";
@@ -35,7 +35,8 @@ constexpr const char* kDigests[] = {"MD5", "SHA-1", "SHA-256"};
 struct Counts {
   int valid = 0, wrong_hash = 0, lenient = 0, acceptable = 0;  // those that verify
   int refused = 0;
-  // Signatures of another length than the modulus. The caller checks the length.
+  // Signatures of another length than the modulus. They are not verified, because rsa_pkcs1_verify
+  // always reads as many bytes as the modulus has.
   int other_length = 0;
 
   bool operator==(const Counts& other) const {
@@ -65,7 +66,7 @@ Bytes WithoutLeadingZeros(Bytes number) {
 
 class Key {
  public:
-  // An older group has "n" and "e" itself, a newer one in "publicKey".
+  // An older group has the key's numbers in "n" and "e". A newer group has them in "publicKey".
   explicit Key(const json& group) {
     const bool is_newer = group.contains("publicKey") && group["publicKey"].is_object();
     const json& key = is_newer ? group["publicKey"] : group;
@@ -79,7 +80,7 @@ class Key {
   }
 
   size_t size() const { return modulus_.size(); }
-  // True if the tool can hold the exponent.
+  // True if the exponent fits in the tool's 4 bytes.
   bool is_usable() const { return is_usable_; }
   bool Verifies(const Bytes& message, const Bytes& signature) const {
     return rsa_pkcs1_verify(&context_, DigestOf(Digest::kSha1, message).data(),
@@ -186,7 +187,7 @@ TEST(Vectors, OfWycheproofFor3072BitsAreJudgedAsTheySay) {
   EXPECT_EQ(JudgeFile(VECTORS_DIR "/wycheproof_3072_sha256.json"), Of(8, 2, 0, 247, 2));
 }
 
-// The files in the configured directory. Without one there are no such tests.
+// The files in the configured directory. If no directory is configured, there are no such tests.
 std::vector<std::string> NamesInTheDirectory() {
   std::vector<std::string> names;
   const std::filesystem::path directory = WYCHEPROOF_DIR;
@@ -206,7 +207,7 @@ GTEST_ALLOW_UNINSTANTIATED_PARAMETERIZED_TEST(VectorsOfTheDirectory);
 INSTANTIATE_TEST_SUITE_P(Files, VectorsOfTheDirectory, testing::ValuesIn(NamesInTheDirectory()),
                          [](const auto& parameter) { return parameter.param; });
 
-// If the project keeps a part of this file, the recipe must take that part from it.
+// If the project has a copy of a file's numbers, take_wycheproof must print the same copy.
 TEST_P(VectorsOfTheDirectory, AreJudgedAsTheySay) {
   EXPECT_GT(JudgeFile(file_).refused, 0);
   std::string kept = GetParam() + ".json";
