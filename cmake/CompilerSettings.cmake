@@ -1,5 +1,5 @@
 # The language level and the warnings of every target, and stricter rules for the tool's own code.
-# Only the developers' presets turn warnings into errors: a new warning of a newer compiler must not
+# Only the developers' presets turn warnings into errors. A new warning of a newer compiler must not
 # stop a package build.
 set(CMAKE_CXX_STANDARD 17)
 set(CMAKE_CXX_STANDARD_REQUIRED ON)
@@ -17,7 +17,7 @@ set(APKTOOLKIT_TOOL_OPTIONS -fno-exceptions -fno-rtti -Wconversion)
 # The hardening that the platform uses for its own programs. Symbols are bound before the program
 # starts, and their table is then read-only. Programs can be loaded at any address. The stack is
 # protected. Calls are checked where the compiler knows the size of a buffer. On 64-bit Arm, jumps
-# and returns are protected, too. scripts/check-binary checks all of it in the compiled files.
+# and returns are protected, too. scripts/check-binary checks all of this in the compiled files.
 option(APKTOOLKIT_HARDEN "Harden programs and libraries as the platform does" ON)
 if(APKTOOLKIT_HARDEN)
   include(CheckPIESupported)
@@ -50,7 +50,7 @@ endif()
 
 option(APKTOOLKIT_COVERAGE "Count the lines that run (scripts/coverage)" OFF)
 if(APKTOOLKIT_COVERAGE)
-  # Threads count the same lines. Without atomic counters some counts become negative.
+  # Several threads count the same lines. Without atomic counters, some counts become negative.
   add_compile_options(--coverage -O0 -fprofile-update=atomic)
   add_link_options(--coverage)
 endif()

@@ -1,7 +1,8 @@
 # The platform's own libraries, as Debian builds them for a workstation: headers under
-# /usr/include/android, libraries in `android/` of the multiarch directory. The headers are system
-# headers: the project cannot fix their `cfi` attribute warnings. Their `libcrypto` is the
-# platform's, not the host's, so their directory comes first.
+# /usr/include/android, libraries in `android/` of the multiarch directory. CMake treats the headers
+# as system headers, because the project cannot fix their warnings about the `cfi` attribute. The
+# directory also has the headers of the platform's `libcrypto`, so it is searched before the host's
+# directories.
 set(PLATFORM_INCLUDE_DIR ${CMAKE_SYSROOT}/usr/include/android CACHE STRING
   "Headers of the platform libraries: one directory, or a list of them")
 set(PLATFORM_LIBRARY_DIR ${CMAKE_SYSROOT}/usr/lib/${CMAKE_LIBRARY_ARCHITECTURE}/android CACHE PATH

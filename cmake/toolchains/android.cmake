@@ -2,7 +2,7 @@
 # the sysroot, with the target's C and C++ libraries. -DPLATFORM_INCLUDE_DIR and
 # -DPLATFORM_LIBRARY_DIR name the platform libraries (docs/porting.md).
 #
-# The system is called Linux, because CMake's own support for Android asks for an NDK.
+# The system is called Linux, because CMake's own support for Android requires an NDK.
 set(CMAKE_SYSTEM_NAME Linux)
 set(CMAKE_SYSTEM_PROCESSOR aarch64)
 
@@ -20,8 +20,8 @@ if(NOT CMAKE_CXX_COMPILER)
 endif()
 set(CMAKE_CXX_COMPILER_TARGET aarch64-linux-android27)
 set(CMAKE_LIBRARY_ARCHITECTURE aarch64-linux-android)
-# The platform's C++ library is libc++. Not every clang chooses it for this target by itself. Some
-# phones have pages of 16 KiB; a program linked for those runs on all phones.
+# The platform's C++ library is libc++. Some clang versions do not choose it for this target. Some
+# phones have pages of 16 KiB. A program that is linked for 16 KiB runs on all phones.
 set(CMAKE_CXX_FLAGS_INIT "-stdlib=libc++")
 set(CMAKE_EXE_LINKER_FLAGS_INIT "-fuse-ld=lld -Wl,-z,max-page-size=16384")
 set(CMAKE_SHARED_LINKER_FLAGS_INIT "-fuse-ld=lld -Wl,-z,max-page-size=16384")
