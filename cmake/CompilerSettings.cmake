@@ -33,7 +33,7 @@ if(APKTOOLKIT_HARDEN)
 endif()
 
 set(APKTOOLKIT_SANITIZE "" CACHE STRING
-  "Sanitizers that everything is built with, as -fsanitize= takes them (empty: none)")
+  "Sanitizers for the whole build, as a value of -fsanitize= (empty: none)")
 if(APKTOOLKIT_SANITIZE)
   add_compile_options(-fsanitize=${APKTOOLKIT_SANITIZE} -fno-sanitize-recover=all
     -fno-omit-frame-pointer)
@@ -42,7 +42,7 @@ endif()
 
 # Unsigned arithmetic may wrap in the tool only in the functions that are marked for it
 # (crypto/wrapping.h).
-option(APKTOOLKIT_CHECK_OVERFLOW "Take unsigned overflow for a mistake (clang)" OFF)
+option(APKTOOLKIT_CHECK_OVERFLOW "Treat unsigned overflow as an error (clang)" OFF)
 if(APKTOOLKIT_CHECK_OVERFLOW)
   list(APPEND APKTOOLKIT_TOOL_OPTIONS -fsanitize=unsigned-integer-overflow
     -fsanitize-ignorelist=${PROJECT_SOURCE_DIR}/cmake/foreign_code.txt)

@@ -64,9 +64,9 @@ const char* TextOf(Reason reason) {
     case Reason::kNoDescriptor:
       return "there is no file";
     case Reason::kNoArchive:
-      return "it is no zip archive, or a damaged one";
+      return "it is not a zip archive, or it is damaged";
     case Reason::kNoPackage:
-      return "it is no package: it has no AndroidManifest.xml";
+      return "it is not a package: it has no AndroidManifest.xml";
     case Reason::kAndroidManifestUnreadable:
       return "AndroidManifest.xml cannot be extracted";
     case Reason::kUnsigned:
@@ -78,25 +78,25 @@ const char* TextOf(Reason reason) {
     case Reason::kNoRsaBlock:
       return "there is no RSA block for its signature file";
     case Reason::kBlockMalformed:
-      return "its signature block is malformed, or not of an RSA key";
+      return "its signature block is malformed, or its key is not an RSA key";
     case Reason::kKeyRefused:
       return "its key cannot be used";
     case Reason::kCertificateRefused:
       return "its certificate is not signed with its own key";
     case Reason::kSignatureRefused:
-      return "its signature file is not what was signed";
+      return "its signature file does not match the signature";
     case Reason::kManifestRefused:
-      return "its manifest is not what was signed";
+      return "its manifest does not match the signature file";
     case Reason::kManifestMalformed:
       return "its manifest is malformed";
     case Reason::kAndroidManifestMalformed:
-      return "its AndroidManifest.xml is no compiled XML";
+      return "its AndroidManifest.xml is not compiled XML";
     case Reason::kDexRefused:
-      return "classes.dex is not what its manifest lists";
+      return "classes.dex does not match the manifest";
     case Reason::kUnknown:
       break;
   }
-  return "for a reason that only the log tells";
+  return "the reason is only in the log";
 }
 
 namespace {

@@ -72,7 +72,7 @@ int main(int argc, char** argv) {
   if (list.others > 0) {
     const std::string others = Counted(list.others, "file", "files");
     Complain(kAllSigned,
-             others + " below the directories left out, by their names: not a package's");
+             others + " below the directories skipped: their names are not those of packages");
   }
   CatchInterruptions();
   std::vector<std::unique_ptr<Answers>> answers(files.size());

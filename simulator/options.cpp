@@ -282,7 +282,8 @@ void AddOutput(CLI::App* app, Options* options) {
   // Standard output has the verdicts, which would make any of these documents malformed.
   const auto is_no_stream = [](const std::string& path) {
     return std::string(
-        path == "-" ? "it is not written to standard output (a file of that name: ./-)" : "");
+        path == "-" ? "it cannot be written to standard output; for a file named -, write ./-"
+                    : "");
   };
   const auto document = [&](const char* name, std::string* path, const char* description) {
     app->add_option(name, *path, description)
@@ -339,8 +340,8 @@ std::optional<int> NameUnknownOption(const CLI::App& app) {
   unknown.erase(std::remove(unknown.begin(), unknown.end(), "--"), unknown.end());
   if (unknown.empty()) return {};
   const std::string word = Printable(unknown[0], {});
-  std::cerr << "there is no option " << word << " (a file of that name: ./" << word
-            << ")\nRun with --help for more information.\n";
+  std::cerr << "there is no option " << word << "; for a file of this name, write ./" << word
+            << "\nRun with --help for more information.\n";
   return kUsageError;
 }
 

@@ -28,7 +28,9 @@ void PrintError(const char* fact, int error);
 
 int main(int argc, char* argv[]) {
   if (!IsCommandLineRight(argc, argv)) {
-    fputs("usage: apktoolkit-verify FILE...\n(a file whose name begins with -: ./-NAME)\n", stderr);
+    fputs(
+        "usage: apktoolkit-verify FILE...\n(for a file whose name begins with -, write ./-NAME)\n",
+        stderr);
     return kUsageError;
   }
   int status = kAllTrusted;

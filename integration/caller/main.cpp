@@ -60,7 +60,8 @@ int main(int argc, char* argv[]) {
   for (std::string line; ReadLine(list, &line);) {
     InstalledPackage package;
     if (!Parse(line, &package)) {
-      fprintf(stderr, "apktoolkit-all: no line of signers and path: %s\n", line.c_str());
+      fprintf(stderr, "apktoolkit-all: this line is not \"DIGEST[,DIGEST]... PATH\": %s\n",
+              line.c_str());
       status = kWrongInput;
       continue;
     }

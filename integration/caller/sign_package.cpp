@@ -60,11 +60,11 @@ const char* Describe(SignOutcome outcome) {
     case SignOutcome::kTrusted:
       return "trusted";
     case SignOutcome::kOtherSigner:
-      return "not trusted: its JAR signature is of another signer than the package manager's";
+      return "not trusted: its JAR signer is not one of the package manager's signers";
     case SignOutcome::kNoJarSigner:
-      return "not trusted: it has no JAR signature that holds";
+      return "not trusted: it has no good JAR signature";
     case SignOutcome::kNotTrusted:
-      return "not trusted: the log of apktoolkit tells why";
+      return "not trusted: see the log of apktoolkit for the reason";
     case SignOutcome::kTimedOut:
       return "not trusted: apktoolkit took too long and was killed";
     case SignOutcome::kOutOfMemory:

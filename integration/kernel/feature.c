@@ -39,15 +39,15 @@ MODULE_LICENSE("GPL");
 
 static char integrity[64] = "1f";
 module_param_string(integrity, integrity, sizeof(integrity), 0644);
-MODULE_PARM_DESC(integrity, "texts for the openings to come, between commas; the last one stays");
+MODULE_PARM_DESC(integrity, "texts for the next openings, separated by commas; the last text is used again");
 
 static int sign_errno;
 module_param(sign_errno, int, 0644);
-MODULE_PARM_DESC(sign_errno, "answer to a signing that is in order; 0: the file is signed");
+MODULE_PARM_DESC(sign_errno, "errno of a valid request to sign; 0: the file is signed");
 
 static int verify_errno = ENOKEY;
 module_param(verify_errno, int, 0644);
-MODULE_PARM_DESC(verify_errno, "answer for a file that is not trusted");
+MODULE_PARM_DESC(verify_errno, "errno for a file that is not trusted");
 
 /* ---- The two commands. Functions return 0 or a negative error number. */
 

@@ -70,11 +70,12 @@ int main(int argc, char* argv[]) {
   const char* const file = argv[argc - 1];
   const std::string signer = JarSigner(file);
   if (signer.empty()) {
-    fprintf(stderr, "apktoolkit-bound: %s has no JAR signature that holds\n", file);
+    fprintf(stderr, "apktoolkit-bound: %s has no good JAR signature\n", file);
     return kNoJarSigner;
   }
   if (!IsAmong(argv[1], signer)) {
-    fprintf(stderr, "apktoolkit-bound: %s: the JAR signer %s is none of the package's signers %s\n",
+    fprintf(stderr,
+            "apktoolkit-bound: %s: the JAR signer %s is not one of the package's signers %s\n",
             file, signer.c_str(), argv[1]);
     return kOtherSigner;
   }

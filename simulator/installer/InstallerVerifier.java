@@ -177,8 +177,8 @@ public final class InstallerVerifier {
         if (first >= KNOWS_V31 && !hasMethod(ApkVerifier.Result.class, "isVerifiedUsingV31Scheme")
                 && NewerSigners.hasV31(source)) {
             throw new UnknownScheme(
-                    "this apksig does not know v3.1, by which phones of API 33 and later install it;"
-                    + " --api 27-32 asks about all others");
+                    "this apksig does not know v3.1, which phones of API 33 and later use;"
+                    + " --api 27-32 asks only about earlier phones");
         }
         int reach = !hasNewer && last >= ASKS_FOR_V2 ? Integer.MAX_VALUE : last;
         Range range = new Range(first, last);

@@ -66,8 +66,8 @@ struct RunRecord {
   bool is_dex_refused = false;
   LogMeaning dex_why = LogMeaning::kUnknown;  // of the first error logged before, if any
   std::vector<Attempt> libraries;             // in order
-  std::optional<Attempt> own;           // the file itself; none: the tool did not get so far
-  std::optional<int64_t> verify_error;  // a plain JAR: 0, or why the kernel does not trust it
+  std::optional<Attempt> own;                 // the file itself; none: the tool did not get so far
+  std::optional<int64_t> verify_error;        // a plain JAR: 0, or why the kernel does not trust it
   bool is_jar = false;
 
   struct Registration {

@@ -54,11 +54,11 @@ std::optional<std::string> OutputFile::Objection(const std::vector<std::string>&
   for (const std::string& input : inputs) {
     struct stat other = {};
     if (stat(input.c_str(), &other) == 0 && AreSame(state, other)) {
-      return named + " is a file that is to be looked at; it is left alone";
+      return named + " is an input of this run; it was not changed";
     }
   }
   if (state.st_size == 0 || BeginsWith(path_, kind_.start)) return {};
-  return named + " is there and holds no " + kind_.name + " of apktoolkit-sim; it is left alone";
+  return named + " exists and is not a " + kind_.name + " of apktoolkit-sim; it was not changed";
 }
 
 bool OutputFile::IsSameAs(const OutputFile& other) const {

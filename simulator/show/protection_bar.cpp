@@ -26,11 +26,11 @@ std::vector<DrawnPart> DrawBar(const Protection& protection, uint64_t file_size)
   std::vector<DrawnPart> parts = {
       {"verified", kVerifiedWord, "dex and native libraries, compared with the manifest", true,
        protection.verified, 0, 0, 0},
-      {"vouched", kVouchedWord, "as the manifest lists them, and the tool does not look", true,
+      {"vouched", kVouchedWord, "match the manifest, but the tool does not check them", true,
        protection.vouched, 0, 0, 0},
       {"differing", kDifferingWord, "changed after signing: the manifest has another digest", true,
        protection.differing, 0, 0, 0},
-      {"uncompared", kUncomparedWord, "damaged, too long, or the time was up", true,
+      {"uncompared", kUncomparedWord, "damaged, too long, or the time limit expired", true,
        protection.uncompared, 0, 0, 0},
       {"missing",
        kMissingWord,

@@ -18,7 +18,7 @@ enum class Group {
   kTool,
   kInstaller,  // a phone's installer does not install the package
   kGate,       // the command line demands something else
-  kWarning,    // a fact that deserves a second look, even if everything was signed
+  kWarning,    // a fact that the user should check, even if everything was signed
 };
 
 // The effect of a cause on its item.
@@ -64,28 +64,28 @@ inline constexpr Cause kFileNotOpened = {"file-not-opened", Group::kNotLookedAt,
     ChainLink::kKey, "", "it cannot be opened (%s)", "Fix the reported error, and run again."};
 inline constexpr Cause kReadOnlyFileSystem = {"read-only-file-system", Group::kNotLookedAt,
     Severity::kUnseen, ChainLink::kKey, "",
-    "it lies on a read-only file system, where the tool leaves every file alone",
+    "it is on a read-only file system, where the tool signs nothing",
     "Nothing to do for a file of the system image. Copy any other file to a file system that can "
     "be written."};
 inline constexpr Cause kStandardInputClosed = {"standard-input-closed", Group::kNotLookedAt,
-    Severity::kUnseen, ChainLink::kKey, "", "standard input is closed, so the file got descriptor 0, "
-    "which the tool takes for a failure",
+    Severity::kUnseen, ChainLink::kKey, "", "standard input is closed, so the file got "
+    "descriptor 0, which the tool treats as a failure",
     "Start the tool with a standard input, for example /dev/null."};
 inline constexpr Cause kFileLeased = {"file-leased", Group::kNotLookedAt, Severity::kUnseen,
     ChainLink::kKey, "", "another process holds a lease on it",
-    "Have that process close the file, and run again; /proc/locks names it by its number."};
+    "Have that process close the file, and run again; /proc/locks shows its process ID."};
 inline constexpr Cause kNoPackages = {"no-packages", Group::kNotLookedAt, Severity::kUnseen,
     ChainLink::kKey, "", "it is a directory, and no file in it or below it has a package's name",
-    "--recursive takes .apk, .jar, .apks, .xapk, .apkm and .aab. Name other files one by one, or "
-    "with --files-from."};
+    "--recursive looks at .apk, .jar, .apks, .xapk, .apkm and .aab. Name other files one by one, "
+    "or with --files-from."};
 
 // ---- The simulation has no result.
 inline constexpr Cause kToolNotStarted = {"tool-not-started", Group::kSimulation, Severity::kFailed,
     ChainLink::kKey, "", "%s", "Check --tool and --runner."};
 inline constexpr Cause kToolTimedOut = {"tool-timed-out", Group::kSimulation, Severity::kFailed,
-    ChainLink::kKey, "", "it was still busy after %s and was stopped", "The tool waits for ever "
-    "while its integrity value reads ffffffff. It waits for a while if another process holds a "
-    "lease on the file. A large file may need a larger --timeout."};
+    ChainLink::kKey, "", "it was still busy after %s and was stopped", "The tool waits as long "
+    "as its integrity value is ffffffff. It waits for a while if another process holds a lease "
+    "on the file. A large file may need a larger --timeout."};
 inline constexpr Cause kStandInsMissing = {"stand-ins-missing", Group::kSimulation,
     Severity::kFailed, ChainLink::kKey, "", "the stand-ins were not loaded into %s",
     "Check --tool: it has to be a dynamically linked program for this processor or for --runner."};
@@ -97,7 +97,7 @@ inline constexpr Cause kStateNotKept = {"state-not-kept", Group::kSimulation, Se
     "Make the --state directory writable."};
 inline constexpr Cause kNotInstalled = {"not-installed", Group::kSimulation, Severity::kFailed,
     ChainLink::kKey, "", "its libraries cannot be laid out: %s",
-    "Make room in the directory for temporary files (TMPDIR), or give --install=no."};
+    "Free space in the directory for temporary files (TMPDIR), or give --install=no."};
 inline constexpr Cause kNotBegun = {"not-begun", Group::kSimulation, Severity::kFailed,
     ChainLink::kKey, "", "no file could be simulated: %s",
     "Fix the reported error, and run again."};
@@ -122,7 +122,8 @@ inline constexpr Cause kTextFile = {"text-file", Group::kFile, Severity::kRefuse
     "`OpenArchiveFd(`", "it is a text and not an archive",
     "It may be the error message of a failed download: read it."};
 inline constexpr Cause kCutArchive = {"cut-archive", Group::kFile, Severity::kRefused,
-    ChainLink::kKey, "`OpenArchiveFd(`", "it begins like an archive and has no end: it was cut off",
+    ChainLink::kKey, "`OpenArchiveFd(`", "it begins like an archive, but its end is missing: it "
+    "was cut off",
     "Copy or download it again, and compare the sizes."};
 inline constexpr Cause kNoArchive = {"no-archive", Group::kFile, Severity::kRefused,
     ChainLink::kKey, "`OpenArchiveFd(`", "it is not a zip archive", "Name a package or a JAR."};
@@ -134,9 +135,9 @@ inline constexpr Cause kDamagedArchive = {"damaged-archive", Group::kFile, Sever
     "Copy or download it again. unzip -t, and the ziparchive lines of the log, name the fault."};
 inline constexpr Cause kEntryTwice = {"entry-twice", Group::kFile, Severity::kRefused,
     ChainLink::kEntries, "`OpenArchiveFd(`",
-    "%s is in it more than once, and the zip library does not open that",
-    "Build the package again, with one entry of each name. If it is not of your making: do not "
-    "trust it."};
+    "%s is in it more than once, and the zip library does not open such an archive",
+    "Build the package again, with one entry of each name. If you did not build it, do not trust "
+    "it."};
 inline constexpr Cause kAppBundle = {"app-bundle", Group::kFile, Severity::kRefused,
     ChainLink::kKey, "`VELT can't verify a file`",
     "it is an app bundle (.aab), which no phone installs",
@@ -151,7 +152,7 @@ inline constexpr Cause kPackageWithoutManifest = {"package-without-manifest", Gr
     "Build the package again with aapt or aapt2, which put AndroidManifest.xml in it."};
 inline constexpr Cause kJarNotTrusted = {"jar-not-trusted", Group::kFile, Severity::kRefused,
     ChainLink::kKey, "`VELT can't verify a file`",
-    "it is a plain JAR, and those are signed only when the kernel trusts them already (%s)",
+    "it is a plain JAR, which is signed only if the kernel already trusts it (%s)",
     "Nothing to do, unless the JAR should have come from a trusted image. Here --trust makes the "
     "kernel trust it."};
 inline constexpr Cause kAndroidManifestDamaged = {"android-manifest-damaged", Group::kFile,
@@ -164,7 +165,7 @@ inline constexpr Cause kUnsigned = {"unsigned", Group::kSignature, Severity::kRe
     ChainLink::kKey, "", "it is unsigned: META-INF/MANIFEST.MF is missing",
     "Sign it: apksigner sign --v1-signing-enabled true."};
 inline constexpr Cause kNewerSchemeOnly = {"newer-scheme-only", Group::kSignature,
-    Severity::kRefused, ChainLink::kKey, "", "it is signed with %s alone, and this tool reads JAR "
+    Severity::kRefused, ChainLink::kKey, "", "it is signed only with %s, and this tool reads JAR "
     "signatures (v1): META-INF/MANIFEST.MF is missing", "Sign it with v1 as well: enableV1Signing "
     "true for the Gradle plugin, or apksigner sign --v1-signing-enabled true --min-sdk-version "
     "23."};
@@ -193,51 +194,53 @@ inline constexpr Cause kSignatureBlockMalformed = {"signature-block-malformed", 
     "Sign the package again with apksigner."};
 inline constexpr Cause kEcKey = {"ec-key", Group::kSignature, Severity::kRefused, ChainLink::kKey,
     "`Can't extract RSA certificate`, `Unknown certificate type`",
-    "its key is an EC key, and this tool knows RSA alone",
-    "Sign it with an RSA key of 2048 to 4096 bits. That is another "
-    "signer: phones refuse it as an update of a published app. Rotation does not help: the JAR "
-    "signature stays the first key's."};
+    "its key is an EC key, and this tool supports only RSA",
+    "Sign it with an RSA key of 2048 to 4096 bits. This makes another signer: phones refuse the "
+    "package as an update of a published app. Key rotation does not help: the JAR signature is "
+    "still made with the first key."};
 inline constexpr Cause kDsaKey = {"dsa-key", Group::kSignature, Severity::kRefused, ChainLink::kKey,
     "`Can't extract RSA certificate`, `Unknown certificate type`",
-    "its key is a DSA key, and this tool knows RSA alone",
-    "Sign it with an RSA key of 2048 to 4096 bits. That is another "
-    "signer: phones refuse it as an update of a published app. Rotation does not help: the JAR "
-    "signature stays the first key's."};
+    "its key is a DSA key, and this tool supports only RSA",
+    "Sign it with an RSA key of 2048 to 4096 bits. This makes another signer: phones refuse the "
+    "package as an update of a published app. Key rotation does not help: the JAR signature is "
+    "still made with the first key."};
 inline constexpr Cause kKeyTooLarge = {"key-too-large", Group::kSignature, Severity::kRefused,
     ChainLink::kKey, "`RSA could not verify certificate`",
-    "its RSA key has %s bits, and this tool takes at most 4096",
-    "Sign it with an RSA key of 2048 to 4096 bits. That is another "
-    "signer: phones refuse it as an update of a published app. Rotation does not help: the JAR "
-    "signature stays the first key's."};
+    "its RSA key has %s bits, and this tool accepts at most 4096",
+    "Sign it with an RSA key of 2048 to 4096 bits. This makes another signer: phones refuse the "
+    "package as an update of a published app. Key rotation does not help: the JAR signature is "
+    "still made with the first key."};
 inline constexpr Cause kKeyTooSmall = {"key-too-small", Group::kSignature, Severity::kRefused,
     ChainLink::kKey, "`RSA could not verify certificate`",
-    "its RSA key has %s bits, and this tool takes at least 128",
-    "Sign it with an RSA key of 2048 to 4096 bits. That is another "
-    "signer: phones refuse it as an update of a published app. Rotation does not help: the JAR "
-    "signature stays the first key's."};
+    "its RSA key has %s bits, and this tool accepts at least 128",
+    "Sign it with an RSA key of 2048 to 4096 bits. This makes another signer: phones refuse the "
+    "package as an update of a published app. Key rotation does not help: the JAR signature is "
+    "still made with the first key."};
 inline constexpr Cause kExponentRefused = {"exponent-refused", Group::kSignature,
     Severity::kRefused, ChainLink::kKey, "`RSA could not set key`",
     "its RSA key has the public exponent %s, with which anyone can make its signatures",
     "Do not trust this package. Normal keys have the exponent 65537."};
 inline constexpr Cause kCertificateIssued = {"certificate-issued", Group::kSignature,
     Severity::kRefused, ChainLink::kCertificate, "`RSA could not verify certificate`",
-    "its certificate was issued by another (%s), and this tool takes self-signed ones alone",
+    "its certificate was issued by another (%s), and this tool accepts only self-signed "
+    "certificates",
     "Sign it with a self-signed certificate: keytool -genkeypair -keyalg RSA -sigalg "
-    "SHA256withRSA. That is another signer: phones refuse it as an update of a published app."};
+    "SHA256withRSA. This makes another signer: phones refuse the package as an update of a "
+    "published app."};
 inline constexpr Cause kCertificateDigest = {"certificate-digest", Group::kSignature,
     Severity::kRefused, ChainLink::kCertificate, "`RSA could not verify certificate`",
     "its certificate is signed with %s, and this tool reads MD5, SHA-1 and SHA-256 with RSA",
     "Certify the same key with SHA-256, and sign again: keytool -selfcert -alias ALIAS -sigalg "
-    "SHA256withRSA -validity 10000 -keystore KEYSTORE. That is another signer: phones refuse it as "
-    "an update of a published app. Without -sigalg keytool takes SHA-384: that of JDK 21 for every "
-    "RSA key, that of JDK 17 for keys of more than 3072 bits."};
+    "SHA256withRSA -validity 10000 -keystore KEYSTORE. This makes another signer: phones refuse "
+    "the package as an update of a published app. Without -sigalg, keytool uses SHA-384: in JDK "
+    "21 for every RSA key, in JDK 17 for keys of more than 3072 bits."};
 inline constexpr Cause kCertificateChanged = {"certificate-changed", Group::kSignature,
     Severity::kRefused, ChainLink::kCertificate, "`RSA could not verify certificate`",
     "its certificate does not carry a signature by its own key",
-    "Sign the package again; if it comes back, make a new certificate for the key."};
+    "Sign the package again; if the error appears again, make a new certificate for the key."};
 inline constexpr Cause kSignedAttributes = {"signed-attributes", Group::kSignature,
     Severity::kRefused, ChainLink::kSignatureFile, "`RSA could not verify data`", "its signature "
-    "covers signed attributes, as jarsigner writes them, and this tool does not read those",
+    "covers signed attributes, which jarsigner writes and this tool does not support",
     "Sign it with apksigner; no option of jarsigner helps."};
 inline constexpr Cause kSignatureDigest = {"signature-digest", Group::kSignature,
     Severity::kRefused, ChainLink::kSignatureFile, "`RSA could not verify data`",
@@ -268,11 +271,11 @@ inline constexpr Cause kAndroidManifestText = {"android-manifest-text", Group::k
 inline constexpr Cause kDexChanged = {"dex-changed", Group::kSignature, Severity::kRefused,
     ChainLink::kEntries, "`Integrity not confirmed: classes.dex`",
     "classes.dex is not the one that was signed", "Sign the package again, as the last step that "
-    "changes it. If nobody changed it: do not trust it."};
+    "changes it. If nobody changed it, do not trust it."};
 inline constexpr Cause kDexNotListed = {"dex-not-listed", Group::kSignature, Severity::kRefused,
     ChainLink::kEntries, "`Can't find file in`",
-    "classes.dex is not in the manifest: it was added after signing", "Sign the package again, as "
-    "the last step that changes it. If nobody changed it: do not trust it."};
+    "classes.dex is not in the manifest: it was added after signing", "Sign the package again, "
+    "as the last step that changes it. If nobody changed it, do not trust it."};
 inline constexpr Cause kDexDigest = {"dex-digest", Group::kSignature, Severity::kRefused,
     ChainLink::kEntries, "`verifyData:`",
     "the manifest has no digest of classes.dex that this tool reads: SHA-1 or SHA-256",
@@ -282,7 +285,7 @@ inline constexpr Cause kEntryEncrypted = {"entry-encrypted", Group::kSignature, 
     "Build the package again without a password."};
 inline constexpr Cause kNoMemory = {"no-memory", Group::kSignature, Severity::kRefused,
     ChainLink::kCertificate, "`RSA could not`", "the tool had no memory left",
-    "Run it again where there is more."};
+    "Run it again with more memory."};
 
 // ---- The kernel.
 inline constexpr Cause kKernelRefused = {"kernel-refused", Group::kKernel, Severity::kRefused,
@@ -294,12 +297,12 @@ inline constexpr Cause kIntegrityZero = {"integrity-zero", Group::kKernel, Sever
     "Look at the domain that the tool is started from: its value must be neither 0 nor ffffffff."};
 inline constexpr Cause kIntegrityMissing = {"integrity-missing", Group::kKernel, Severity::kRefused,
     ChainLink::kNone, "`VELT can't sign a`",
-    "the tool has no integrity value: /proc/self/integrity/value is not there",
+    "the tool has no integrity value: /proc/self/integrity/value does not exist",
     "The file was good. The kernel lacks the feature, or /proc is not mounted."};
 inline constexpr Cause kIntegrityUnreadable = {"integrity-unreadable", Group::kKernel,
     Severity::kRefused, ChainLink::kNone, "`VELT can't sign a`",
     "the tool's own integrity value reads \"%s\", which is not a number",
-    "The file was good. Look at what /proc/self/integrity/value holds on that kernel."};
+    "The file was good. Check what /proc/self/integrity/value contains on that kernel."};
 
 // ---- A library.
 inline constexpr Cause kLibraryChanged = {"library-changed", Group::kLibrary, Severity::kRefused,
@@ -308,9 +311,9 @@ inline constexpr Cause kLibraryChanged = {"library-changed", Group::kLibrary, Se
     "The file beside the package was changed after it was installed. Install the package again."};
 inline constexpr Cause kLibraryChangedInside = {"library-changed-inside", Group::kLibrary,
     Severity::kRefused, ChainLink::kEntries, "`VeltSignJni: File not verified`",
-    "the package's own copy of it is not what its manifest lists",
-    "Sign the package again, as the last step that changes it. If nobody changed it: do not trust "
-    "it."};
+    "the package's own copy of it does not match the manifest",
+    "Sign the package again, as the last step that changes it. If nobody changed it, do not "
+    "trust it."};
 inline constexpr Cause kLibraryNotListed = {"library-not-listed", Group::kLibrary,
     Severity::kRefused, ChainLink::kEntries, "`Can't find file in`",
     "the manifest does not list it: it was added after signing",
@@ -327,7 +330,8 @@ inline constexpr Cause kLibraryNotOpened = {"library-not-opened", Group::kLibrar
     Severity::kRefused, ChainLink::kNone, "`Can't open file`, `File %s is not opened`",
     "it cannot be opened (%s)", "Fix the reported error, and run again."};
 inline constexpr Cause kLibraryNoFile = {"library-no-file", Group::kLibrary, Severity::kRefused,
-    ChainLink::kNone, "`Can't read file`", "the thing at its place is not a file, or is too large to read",
+    ChainLink::kNone, "`Can't read file`", "what is at its path is not a regular file, or is too "
+    "large to read",
     "Find out who put it there, and install the package again."};
 inline constexpr Cause kLibraryInPackage = {"library-in-package", Group::kLibrary,
     Severity::kAbsent, ChainLink::kNone, "`Can't open file`",
@@ -340,7 +344,8 @@ inline constexpr Cause kLibraryNotInstalled = {"library-not-installed", Group::k
     "processors, give --install=all."};
 inline constexpr Cause kLibraryNotLaidOut = {"library-not-laid-out", Group::kLibrary,
     Severity::kNothing, ChainLink::kNone, "`Can't open file`",
-    "it is for another processor than the phone's (--install=all lays out those of all)",
+    "it is for another processor than the phone's (--install=all lays out the libraries of all "
+    "processors)",
     "Nothing to do: phones install the libraries of one processor."};
 inline constexpr Cause kLibraryInSubdirectory = {"library-in-subdirectory", Group::kLibrary,
     Severity::kAbsent, ChainLink::kNone, "`Can't open file`",
@@ -356,16 +361,16 @@ inline constexpr Cause kPackageRefused = {"package-refused", Group::kLibrary, Se
     ChainLink::kNone, "`VeltSignJni: malformed apk`, `Apk archive is not valid`",
     "the package is refused", "First fix the reason why the package is refused."};
 inline constexpr Cause kNotReached = {"not-reached", Group::kLibrary, Severity::kFollows,
-    ChainLink::kEntries, "", "the tool did not come to it", "See why the tool ended early."};
+    ChainLink::kEntries, "", "the tool did not reach it", "See why the tool ended early."};
 inline constexpr Cause kLibraryLeased = {"library-leased", Group::kLibrary, Severity::kRefused,
     ChainLink::kNone, "`Can't open file`", "another process holds a lease on it",
-    "Have that process close the file, and run again; /proc/locks names it by its number."};
+    "Have that process close the file, and run again; /proc/locks shows its process ID."};
 inline constexpr Cause kLibraryNotExtracted = {"library-not-extracted", Group::kLibrary,
     Severity::kRefused, ChainLink::kEntries, "", "it cannot be extracted from the package",
     "Copy or build the package again; unzip -t names the fault."};
 inline constexpr Cause kLibraryBehindDamage = {"library-behind-damage", Group::kLibrary,
     Severity::kRefused, ChainLink::kNone, "",
-    "the tool did not come to it: a damaged entry ends its walk over the libraries",
+    "the tool did not reach it: a damaged entry ends its walk over the libraries",
     "Copy or build the package again; unzip -t names the damaged entry."};
 
 // ---- The key.
@@ -388,42 +393,42 @@ inline constexpr Cause kToolError = {"tool-error", Group::kTool, Severity::kRefu
 // ---- The installer of the phones.
 inline constexpr Cause kNotInstallable = {"not-installable", Group::kInstaller, Severity::kRefused,
     ChainLink::kNone, "", "phones do not install it: %s",
-    "Sign the package again, as the last step that changes it. If it is not of your making: do not "
+    "Sign the package again, as the last step that changes it. If you did not build it, do not "
     "trust it. apksigner verify --min-sdk-version 27 names every fault."};
 inline constexpr Cause kNotInstallableOnSome = {"not-installable-on-some", Group::kInstaller,
     Severity::kRefused, ChainLink::kNone, "", "phones of %s",
     "Sign it so that all of these phones install it, as apksigner does by default. If it is only "
     "for some of them, name those with --api."};
 inline constexpr Cause kInstallerGaveUp = {"installer-gave-up", Group::kInstaller,
-    Severity::kRefused, ChainLink::kNone, "", "the installer's verifier gave up: %s", "Do not "
-    "trust this package, if it is not of your making. A large one may need a larger --timeout; "
+    Severity::kRefused, ChainLink::kNone, "", "the installer's verifier gave up: %s", "If you "
+    "did not build this package, do not trust it. A large package may need a larger --timeout; "
     "--installer=off judges without the installer."};
 
 // ---- The gate: what the command line demands.
 inline constexpr Cause kSignerUnexpected = {"signer-unexpected", Group::kGate, Severity::kRefused,
     ChainLink::kNone, "", "its signer is not one that --signer names: %s",
-    "Sign it with the key that --signer names; a rotated key has to be named as well. If it is not "
-    "of your making: do not trust it."};
+    "Sign it with the key that --signer names; a rotated key has to be named as well. If you did "
+    "not build it, do not trust it."};
 inline constexpr Cause kSignerNone = {"signer-none", Group::kGate, Severity::kRefused,
     ChainLink::kNone, "", "it has no signer: the kernel trusts the JAR by its bytes (%s)",
-    "Look at JARs without --signer."};
+    "Run without --signer for JARs."};
 inline constexpr Cause kSignerNotVerified = {"signer-not-verified", Group::kGate,
     Severity::kFollows, ChainLink::kNone, "", "its signer is not known: the tool verified no "
     "signature (%s)", "First fix the reason why the file is refused."};
 inline constexpr Cause kSignerDiffers = {"signer-differs", Group::kGate, Severity::kRefused,
     ChainLink::kNone, "", "the files of a package must have one signer: %s",
-    "Sign all files of the package with one key and certificate. Look at its other builds in "
+    "Sign all files of the package with one key and certificate. Check its other builds in "
     "separate runs."};
 
 inline constexpr Cause kWarningsRefused = {"warnings-refused", Group::kGate, Severity::kRefused,
     ChainLink::kNone, "", "a warning counts as a refusal (--werror): %s",
     "See what to do about each warning."};
 
-// ---- Warnings: facts that deserve a second look, even if everything was signed.
+// ---- Warnings: facts that the user should check, even if everything was signed.
 inline constexpr Cause kOtherKey = {"other-key", Group::kWarning, Severity::kWarning,
     ChainLink::kNone, "", "%s is made with another key than the JAR signature: phones install the "
     "package for that other key, but the kernel gets the JAR signature's key", "Sign all schemes "
-    "with one key. Only the newer schemes use a rotated key. If it is not of your making: do not "
+    "with one key. Only the newer schemes use a rotated key. If you did not build it, do not "
     "trust it."};
 inline constexpr Cause kSchemesStripped = {"schemes-stripped", Group::kWarning, Severity::kWarning,
     ChainLink::kNone, "", "the signature file says that the package is signed with %s as well, and "
@@ -439,20 +444,22 @@ inline constexpr Cause kForgeableKey = {"forgeable-key", Group::kWarning, Severi
     ChainLink::kNone, "", "the key has the public exponent %s: anyone can make its signatures",
     "Do not trust this package. Normal keys have the exponent 65537."};
 inline constexpr Cause kEntriesChanged = {"entries-changed", Group::kWarning, Severity::kWarning,
-    ChainLink::kNone, "", "%s: not as the manifest lists, and the tool does not look there",
-    "Sign the package again, as the last step that changes it. If it is not of your making: do not "
+    ChainLink::kNone, "", "%s: different from the manifest, and the tool does not check this",
+    "Sign the package again, as the last step that changes it. If you did not build it, do not "
     "trust it."};
 inline constexpr Cause kEntriesMissing = {"entries-missing", Group::kWarning, Severity::kWarning,
     ChainLink::kNone, "", "%s: in the manifest and not in the package",
-    "Sign the package again, as the last step that changes it. If it is not of your making: do not "
+    "Sign the package again, as the last step that changes it. If you did not build it, do not "
     "trust it."};
 inline constexpr Cause kEntriesNotCompared = {"entries-not-compared", Group::kWarning,
     Severity::kAlarm, ChainLink::kNone, "", "%s not compared with the manifest: unreadable, too "
-    "long, of another digest than SHA-1 and SHA-256, or the time was up",
-    "unzip -t names an unreadable entry. Run it again with a larger --timeout. Entries above 512 MiB are not compared."};
+    "long, with a digest other than SHA-1 and SHA-256, or the time limit expired",
+    "unzip -t names an unreadable entry. Run it again with a larger --timeout. Entries above 512 "
+    "MiB are not compared."};
 inline constexpr Cause kWeakKey = {"weak-key", Group::kWarning, Severity::kWarning,
     ChainLink::kNone, "", "its RSA key has %s bits; fewer than 2048 bits are not safe",
-    "Sign a new app with a key of 2048 bits or more. For a published one that is another signer."};
+    "Sign a new app with a key of 2048 bits or more. For a published app, a new key makes "
+    "another signer."};
 inline constexpr Cause kDebugKey = {"debug-key", Group::kWarning, Severity::kWarning,
     ChainLink::kNone, "", "it is signed with a debug certificate (CN=Android Debug); each "
     "workstation makes another one", "Sign a release with a release key."};
@@ -463,7 +470,7 @@ inline constexpr Cause kWeakDigest = {"weak-digest", Group::kWarning, Severity::
 inline constexpr Cause kCertificateExpired = {"certificate-expired", Group::kWarning,
     Severity::kWarning, ChainLink::kNone, "", "its certificate expired on %s",
     "Phones still install it. A published app must keep its certificate: a new one makes another "
-    "signer. For a new app make one that lasts: keytool -validity 10000."};
+    "signer. For a new app, make a certificate that lasts: keytool -validity 10000."};
 inline constexpr Cause kUnlistedEntries = {"unlisted-entries", Group::kWarning, Severity::kWarning,
     ChainLink::kNone, "", "the signature does not protect %s: no digest in the manifest",
     "Sign the package again, as the last step that changes it; --verbose lists them."};
@@ -472,18 +479,18 @@ inline constexpr Cause kNotLaidOut = {"not-laid-out", Group::kWarning, Severity:
     "Build the package again with its libraries as lib/ABI/NAME."};
 inline constexpr Cause kCertificateOtherKey = {"certificate-other-key", Group::kWarning,
     Severity::kAlarm, ChainLink::kNone, "",
-    "its certificate shows another key than the tool reads: %s", "Do not trust this package, if it "
-    "is not of your making: other programs see another key in it."};
+    "its certificate shows another key than the tool reads: %s", "If you did not build this "
+    "package, do not trust it: other programs see another key in it."};
 inline constexpr Cause kBlockAmbiguous = {"block-ambiguous", Group::kWarning, Severity::kAlarm,
     ChainLink::kNone, "",
     "others may read another signer in its signature block than the tool does: %s",
-    "Sign the package again with apksigner. If it is not of your making: do not trust it."};
+    "Sign the package again with apksigner. If you did not build it, do not trust it."};
 inline constexpr Cause kOtherPackageName = {"other-package-name", Group::kWarning, Severity::kAlarm,
     ChainLink::kNone, "", "phones install it as %s, but the tool reads another package name",
-    "Build the package again with aapt or aapt2. If it is not of your making: do not trust it."};
+    "Build the package again with aapt or aapt2. If you did not build it, do not trust it."};
 inline constexpr Cause kNotLookedInto = {"not-looked-into", Group::kWarning, Severity::kAlarm,
     ChainLink::kNone, "", "%s is too large and was not read, so this answer leaves it out",
-    "Do not trust this package, if it is not of your making: in real packages it is small."};
+    "If you did not build this package, do not trust it: in real packages this part is small."};
 inline constexpr Cause kEntriesEncrypted = {"entries-encrypted", Group::kWarning, Severity::kDoubt,
     ChainLink::kNone, "", "%s: encrypted, and no phone decrypts it",
     "Build the package again without a password."};

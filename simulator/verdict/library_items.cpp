@@ -132,7 +132,7 @@ Reason WhyNotThere(const LibraryFacts& library, const RunRecord& run, const Pack
   const int error = library.error;
   if (error == EACCES || error == EPERM) return {&cause::kLibraryNoPermission, ""};
   if (error == EWOULDBLOCK) return {&cause::kLibraryLeased, ""};
-  if (error == 0) return {&cause::kLibraryNotOpened, "why is not known"};
+  if (error == 0) return {&cause::kLibraryNotOpened, "the reason is not known"};
   if (error != ENOENT && error != ENOTDIR) {
     return {&cause::kLibraryNotOpened, DescribeErrno(error)};
   }

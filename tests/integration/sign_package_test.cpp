@@ -146,7 +146,7 @@ TEST_F(AfterAnUpdate, OneThatIsRefusedKeepsNoOtherFromBeingSigned) {
             other.path +
                 ": not trusted: its JAR signature is of another signer than the package "
                 "manager's\n" +
-                none.path + ": not trusted: it has no JAR signature that holds\n" + good.path +
+                none.path + ": not trusted: it has no good JAR signature\n" + good.path +
                 ": trusted\n");
   EXPECT_EQ(run.status, 1);
 }
@@ -155,10 +155,11 @@ TEST_F(AfterAnUpdate, WrongLinesAreToldOfAndPassedOver) {
   const InstalledPackage good = Install("apksigner-sha256-2048");
   const ProcessResult run = SignAll("nonsense\n\nabc relative/base.apk\n" + Line(good));
   EXPECT_EQ(run.output, good.path + ": trusted\n");
-  EXPECT_EQ(run.errors,
-            "apktoolkit-all: no line of signers and path: nonsense\n"
-            "apktoolkit-all: no line of signers and path: \n"
-            "apktoolkit-all: no line of signers and path: abc relative/base.apk\n");
+  EXPECT_EQ(
+      run.errors,
+      "apktoolkit-all: this line is not \"DIGEST[,DIGEST]... PATH\": nonsense\n"
+      "apktoolkit-all: this line is not \"DIGEST[,DIGEST]... PATH\": \n"
+      "apktoolkit-all: this line is not \"DIGEST[,DIGEST]... PATH\": abc relative/base.apk\n");
   EXPECT_EQ(run.status, 2);
 }
 

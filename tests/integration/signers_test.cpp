@@ -81,11 +81,11 @@ TEST_F(PackageWithTwoFaces, IsNotGivenToTheTool) {
   const ProcessResult run = Bound(SignersOf(apk_), apk_);
   EXPECT_EQ(run.status, kOtherSigner);
   EXPECT_EQ(run.output, "");
-  EXPECT_NE(
-      run.errors.find("apktoolkit-bound: " + apk_ + ": the JAR signer " +
-                      DigestOfKey("apksigner-sha256-2048") + " is none of the package's signers " +
-                      DigestOfKey("openssl-cms-issued") + "\n"),
-      std::string::npos)
+  EXPECT_NE(run.errors.find("apktoolkit-bound: " + apk_ + ": the JAR signer " +
+                            DigestOfKey("apksigner-sha256-2048") +
+                            " is not one of the package's signers " +
+                            DigestOfKey("openssl-cms-issued") + "\n"),
+            std::string::npos)
       << run.errors;
 }
 

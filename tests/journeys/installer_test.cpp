@@ -105,8 +105,7 @@ TEST(Entries, LibraryChangedInsideThePackageIsNotBlamedOnTheInstallation) {
   const json event = VerdictOf("changed-inside", {"--installer=off", "--install"});
   EXPECT_EQ(event["verdict"], "partly-signed");
   EXPECT_EQ(event["items"][1]["reason"], "library-changed-inside");
-  EXPECT_EQ(event["items"][1]["text"],
-            "the package's own copy of it is not what its manifest lists");
+  EXPECT_EQ(event["items"][1]["text"], "the package's own copy of it does not match the manifest");
   EXPECT_EQ(event["warnings"], json::array());
   EXPECT_EQ(event["entries"]["differing"]["looked_at"], 1);
 }

@@ -6,7 +6,7 @@
 namespace {
 
 constexpr char kLaidOut[] =
-    "  libraries laid out beside it as an installer does; --install=no leaves it as it lies";
+    "  libraries laid out beside it, as by an installer; --install=no turns this off";
 
 TEST_F(Reason, TamperedLibrary) {
   Take("apksigner-sha256-2048");
@@ -44,8 +44,8 @@ TEST_F(Reason, LibrariesOfAnotherProcessorAreNotLaidOut) {
   Take("apksigner-sha256-2048");
   Do("rm -r lib");
   const std::string other =
-      "nothing to sign: it is for another processor than the phone's (--install=all lays out those "
-      "of all)";
+      "nothing to sign: it is for another processor than the phone's (--install=all lays out "
+      "the libraries of all processors)";
   EXPECT_EQ(
       Told(6, {"--install", "--strict"}),
       Lines({"SIGNED  base.apk" + ByRsa2048(), kSigned, "  ✓ lib/arm64/libvault.so  signed",

@@ -55,7 +55,8 @@ class ManyFiles : public testing::Test {
 };
 
 constexpr char kOthers[] =
-    "apktoolkit-sim: 1 file below the directories left out, by their names: not a package's\n";
+    "apktoolkit-sim: 1 file below the directories skipped: their names are not those of "
+    "packages\n";
 
 }  // namespace
 

@@ -26,7 +26,7 @@ TEST_F(Reason, NewerSchemeOnly) {
   EXPECT_EQ(
       Told(4),
       Lines({"REFUSED  base.apk",
-             "  ✗ package                not signed: it is signed with v2, v3 alone, and "
+             "  ✗ package                not signed: it is signed only with v2, v3, and "
              "this tool reads JAR signatures (v1): META-INF/MANIFEST.MF is missing",
              "      Sign it with v1 as well: enableV1Signing true for the Gradle plugin, or",
              "      apksigner sign --v1-signing-enabled true --min-sdk-version 23.", "-> 1"}));
@@ -38,31 +38,30 @@ TEST_F(Reason, SignedByJarsigner) {
     const Lines told = WithoutReason(3, FirstLines(kAll, {"base.apk"}, {{}, directory}));
     EXPECT_EQ(told, Lines({"REFUSED  base.apk",
                            "  ✗ package                not signed: its signature covers signed "
-                           "attributes, as jarsigner writes them, and this tool does not read "
-                           "those",
+                           "attributes, which jarsigner writes and this tool does not support",
                            "      Sign it with apksigner; no option of jarsigner helps.", "-> 1"}));
   }
 }
 
 TEST_F(Reason, CertificateThatAnAuthorityIssued) {
   Take("openssl-cms-issued");
-  EXPECT_EQ(Told(4),
-            Lines({"REFUSED  base.apk",
-                   "  ✗ package                not signed: its certificate was issued by "
-                   "another (CN=rsa-2048, O=Example), and this tool takes self-signed "
-                   "ones alone",
-                   "      Sign it with a self-signed certificate: keytool -genkeypair -keyalg RSA",
-                   "      -sigalg SHA256withRSA. That is another signer: phones refuse it as an",
-                   "-> 1"}));
+  EXPECT_EQ(
+      Told(4),
+      Lines({"REFUSED  base.apk",
+             "  ✗ package                not signed: its certificate was issued by "
+             "another (CN=rsa-2048, O=Example), and this tool accepts only self-signed "
+             "certificates",
+             "      Sign it with a self-signed certificate: keytool -genkeypair -keyalg RSA",
+             "      -sigalg SHA256withRSA. This makes another signer: phones refuse the", "-> 1"}));
 }
 
 TEST_F(Reason, EcKey) {
   Take("apksigner-ec");
   EXPECT_EQ(Told(3),
             Lines({"REFUSED  base.apk",
-                   "  ✗ package                not signed: its key is an EC key, and this "
-                   "tool knows RSA alone",
-                   "      Sign it with an RSA key of 2048 to 4096 bits. That is another signer:",
+                   "  ✗ package                not signed: its key is an EC key, and this tool "
+                   "supports only RSA",
+                   "      Sign it with an RSA key of 2048 to 4096 bits. This makes another signer:",
                    "-> 1"}));
 }
 
@@ -70,9 +69,9 @@ TEST_F(Reason, KeyOfMoreThan4096Bits) {
   Take("apksigner-5120");
   EXPECT_EQ(Told(3),
             Lines({"REFUSED  base.apk",
-                   "  ✗ package                not signed: its RSA key has 5120 bits, and "
-                   "this tool takes at most 4096",
-                   "      Sign it with an RSA key of 2048 to 4096 bits. That is another signer:",
+                   "  ✗ package                not signed: its RSA key has 5120 bits, and this "
+                   "tool accepts at most 4096",
+                   "      Sign it with an RSA key of 2048 to 4096 bits. This makes another signer:",
                    "-> 1"}));
 }
 
@@ -83,12 +82,13 @@ TEST_F(Reason, DsaKey) {
      "apksigner sign --ks key.p12 --ks-pass pass:android --v1-signer-name CERT "
      "--min-sdk-version 21 --in " +
      std::string(GOLDEN_PACKAGES) + "/unsigned.apk --out base.apk");
-  EXPECT_EQ(Told(3), Lines({"REFUSED  base.apk",
-                            "  ✗ package                not signed: its key is a DSA key, and this "
-                            "tool knows RSA alone",
-                            "      Sign it with an RSA key of 2048 to 4096 bits. That is another "
-                            "signer:",
-                            "-> 1"}));
+  EXPECT_EQ(Told(3),
+            Lines({"REFUSED  base.apk",
+                   "  ✗ package                not signed: its key is a DSA key, and "
+                   "this tool supports only RSA",
+                   "      Sign it with an RSA key of 2048 to 4096 bits. This makes another "
+                   "signer:",
+                   "-> 1"}));
 }
 
 // The cure also states its cost.
@@ -99,9 +99,9 @@ TEST_F(Reason, AnotherKeyIsAnotherSignerAndRotationDoesNotHelp) {
     const Lines told = Told(kAll);
     ASSERT_GT(told.size(), 5U);
     EXPECT_EQ(told[2] + told[3] + told[4],
-              "      Sign it with an RSA key of 2048 to 4096 bits. That is another signer:"
-              "      phones refuse it as an update of a published app. Rotation does not help:"
-              "      the JAR signature stays the first key's.")
+              "      Sign it with an RSA key of 2048 to 4096 bits. This makes another signer:"
+              "      phones refuse the package as an update of a published app. Key rotation"
+              "      does not help: the JAR signature is still made with the first key.")
         << name;
   }
 }
@@ -111,14 +111,13 @@ TEST_F(Reason, AnotherKeyIsAnotherSignerAndRotationDoesNotHelp) {
 TEST_F(Reason, CertificateSignedWithALongerDigest) {
   Take("keytool-sha384");
   const Lines told = Told(5);
-  EXPECT_EQ(
-      Lines(told.begin() + 1, told.end()),
-      Lines({"  ✗ package                not signed: its certificate is signed with "
-             "SHA384withRSA, and this tool reads MD5, SHA-1 and SHA-256 with RSA",
-             "      Certify the same key with SHA-256, and sign again: keytool -selfcert",
-             "      -alias ALIAS -sigalg SHA256withRSA -validity 10000 -keystore KEYSTORE.",
-             "      That is another signer: phones refuse it as an update of a published app.",
-             "-> 1"}));
+  EXPECT_EQ(Lines(told.begin() + 1, told.end()),
+            Lines({"  ✗ package                not signed: its certificate is signed with "
+                   "SHA384withRSA, and this tool reads MD5, SHA-1 and SHA-256 with RSA",
+                   "      Certify the same key with SHA-256, and sign again: keytool -selfcert",
+                   "      -alias ALIAS -sigalg SHA256withRSA -validity 10000 -keystore KEYSTORE.",
+                   "      This makes another signer: phones refuse the package as an update of a",
+                   "-> 1"}));
   EXPECT_EQ(FirstLines(0, {"base.apk"}, {{}, std::string(GOLDEN_PACKAGES) + "/keytool-sha256"}),
             Lines({"-> 0"}));
 }
@@ -166,8 +165,8 @@ TEST_F(Reason, CutFile) {
   Take("apksigner-sha256-2048");
   Do("truncate -s 5000 base.apk");
   EXPECT_EQ(Told(2), Lines({"REFUSED  base.apk",
-                            "  ✗ file  not signed: it begins like an archive and has no end: it "
-                            "was cut off",
+                            "  ✗ file  not signed: it begins like an archive, but its end is "
+                            "missing: it was cut off",
                             "-> 1"}));
   // The zip library's own message is part of the timeline.
   EXPECT_EQ(Told(4)[3], "   1  log        [ziparchive] Zip: EOCD not found, " +
@@ -234,8 +233,8 @@ TEST_F(Reason, ReadOnlyFileSystem) {
   const Lines before = OnItsOwnFileSystem(directory_ / "base.apk", mount_point.path(), "ro");
   EXPECT_EQ(Told(2, {}, apk, before),
             Lines({"NOT LOOKED AT  " + apk,
-                   "  ✗ file  not looked at: it lies on a read-only file system, where the tool "
-                   "leaves every file alone",
+                   "  ✗ file  not looked at: it is on a read-only file system, where the tool "
+                   "signs nothing",
                    "-> 4"}));
 }
 
@@ -244,7 +243,7 @@ TEST_F(Reason, ClosedStandardInput) {
   EXPECT_EQ(Told(2, {}, "base.apk", {"bash", "-c", "exec \"$0\" \"$@\" <&-"}),
             Lines({"NOT LOOKED AT  base.apk",
                    "  ✗ file  not looked at: standard input is closed, so the file got "
-                   "descriptor 0, which the tool takes for a failure",
+                   "descriptor 0, which the tool treats as a failure",
                    "-> 4"}));
 }
 
@@ -300,7 +299,7 @@ TEST_F(Reason, EntryThatStandsTwice) {
      "'classes.dex', 'x')\"");
   EXPECT_EQ(Told(2)[1],
             "  ✗ file  not signed: classes.dex is in it more than once, and the zip library "
-            "does not open that");
+            "does not open such an archive");
 }
 
 TEST_F(Reason, EncryptedEntry) {

@@ -183,7 +183,7 @@ TEST(Verify, WithoutTheFeatureNothingIsTrusted) {
 
 TEST(VerifyUsage, IsShownWithoutAFileAndForWhatLooksLikeAnOption) {
   const std::string usage =
-      "usage: apktoolkit-verify FILE...\n(a file whose name begins with -: ./-NAME)\n";
+      "usage: apktoolkit-verify FILE...\n(for a file whose name begins with -, write ./-NAME)\n";
   for (const Words& words : {Words{}, {"--help"}, {"/dev/null", "-x"}, {"-"}}) {
     const ProcessResult run = VerifyHere(words);
     EXPECT_EQ(run.status, 2);

@@ -155,7 +155,7 @@ TEST(VerificationReason, HasATextOfItsOwnForEach) {
     texts.insert(TextOf(static_cast<Reason>(i)));
   }
   EXPECT_EQ(texts.size(), static_cast<size_t>(Reason::kUnknown) + 1);
-  EXPECT_STREQ(TextOf(Reason::kManifestRefused), "its manifest is not what was signed");
+  EXPECT_STREQ(TextOf(Reason::kManifestRefused), "its manifest does not match the signature file");
 }
 
 // A verification that is made while another one exists has its own reason.

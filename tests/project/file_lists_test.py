@@ -149,7 +149,7 @@ def without_comments_of_cmake(path):
 
 def compare(name, left, right, problems):
     for item in sorted(set(left) ^ set(right)):
-        problems.append(f"{name}: {item} stands on one side only")
+        problems.append(f"{name}: {item} is on one side only")
 
 
 if __name__ == "__main__":

@@ -79,7 +79,7 @@ def causes():
     rows = [{field: joined(text).replace('\\"', '"') if text.startswith('"') else text
              for field, text in row.groupdict().items()} for row in CAUSE.finditer(header)]
     if len(rows) != header.count("Cause k"):
-        sys.exit(f"{CAUSES}: a row does not read")
+        sys.exit(f"{CAUSES}: a row cannot be parsed")
     return rows
 
 
@@ -104,7 +104,7 @@ def codes(rows):
 def reasons_problems(rows, messages):
     problems = []
     if len({row["code"] for row in rows}) != len(rows):
-        problems.append("a code stands twice")
+        problems.append("a code is there twice")
     chosen = "".join(path.read_text() for path in (ROOT / "simulator").rglob("*.cpp"))
     for row in rows:
         name = row["name"]
@@ -132,7 +132,7 @@ def log_problems(messages):
     problems = [f"the tool does not log {text}" for text in (joined(text) for text, _ in rows)
                 if text not in messages]
     if len(rows) != source.count("{LogMeaning::"):
-        problems.append(f"{LOG_LINES}: a row does not read")
+        problems.append(f"{LOG_LINES}: a row cannot be parsed")
     for text, captured in rows:
         if captured != "kNothing" and int(captured) >= len(re.findall("%", text)):
             problems.append(f"there is nothing to capture in {joined(text)}")
@@ -150,7 +150,7 @@ def library_problems(messages):
     problems = [f"{LIBRARY}: the tool does not log {start}" for start in starts
                 if not any(message.startswith(start) for message in messages)]
     if not starts or len(starts) != source.count(", Reason::k"):
-        problems.append(f"{LIBRARY}: a row does not read")
+        problems.append(f"{LIBRARY}: a row cannot be parsed")
     return problems
 
 

@@ -252,7 +252,7 @@ TEST(ExitStatus, TwoWhenTheJournalWouldReplaceAFile) {
   EXPECT_EQ(result.status, 2);
   EXPECT_EQ(result.output, "");
   EXPECT_EQ(result.errors, "apktoolkit-sim: --journal " + probe.path() +
-                               " is a file that is to be looked at; it is left alone\n");
+                               " is an input of this run; it was not changed\n");
   EXPECT_EQ(ContentOf(probe.path()), before);
 }
 
@@ -265,9 +265,9 @@ TEST(ExitStatus, TwoWhenThePageWouldReplaceAFile) {
     EXPECT_EQ(result.status, 2);
     EXPECT_EQ(result.output, "");
     EXPECT_EQ(result.errors, "apktoolkit-sim: --html " + victim +
-                                 (victim == notes ? " is there and holds no page of apktoolkit-sim"
-                                                  : " is a file that is to be looked at") +
-                                 "; it is left alone\n");
+                                 (victim == notes ? " exists and is not a page of apktoolkit-sim"
+                                                  : " is an input of this run") +
+                                 "; it was not changed\n");
     EXPECT_EQ(ContentOf(victim), before);
   }
 }
@@ -285,7 +285,7 @@ TEST(ExitStatus, TwoWhenATrustedFileOrTheToolWouldBeReplaced) {
     EXPECT_EQ(result.status, 2);
     return result.errors;
   };
-  const std::string end = " is a file that is to be looked at; it is left alone\n";
+  const std::string end = " is an input of this run; it was not changed\n";
   EXPECT_EQ(errors({"--journal", journal, "--trust", journal, probe.path()}),
             "apktoolkit-sim: --journal " + journal + end);
   EXPECT_EQ(errors({"--html", page, "--trust", "/dev/null", "--trust", page, probe.path()}),
@@ -316,9 +316,9 @@ TEST(ExitStatus, TwoWhenAReportWouldReplaceAFile) {
       EXPECT_EQ(result.output, "");
       EXPECT_EQ(result.errors,
                 "apktoolkit-sim: " + report[0] + " " + victim +
-                    (victim == other ? " is there and holds no " + report[1] + " of apktoolkit-sim"
-                                     : " is a file that is to be looked at") +
-                    "; it is left alone\n");
+                    (victim == other ? " exists and is not a " + report[1] + " of apktoolkit-sim"
+                                     : " is an input of this run") +
+                    "; it was not changed\n");
       EXPECT_EQ(ContentOf(victim), before);
     }
   }

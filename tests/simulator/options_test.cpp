@@ -249,13 +249,13 @@ TEST(Options, AnUnknownErrorIsNamed) {
 
 TEST(Options, OnlyTheJournalGoesToStandardOutput) {
   EXPECT_EQ(LinesOf(Told({"--junit", "-", "a.apk"}).errors)[0],
-            "--junit: it is not written to standard output (a file of that name: ./-)");
+            "--junit: it cannot be written to standard output; for a file named -, write ./-");
   EXPECT_TRUE(Parsed({"--journal", "-", "a.apk"}).show.json);
 }
 
 TEST(Options, FileThatLooksLikeAnOptionIsNamed) {
   EXPECT_EQ(LinesOf(Told({"-dash.apk"}).errors)[0],
-            "there is no option -dash.apk (a file of that name: ./-dash.apk)");
+            "there is no option -dash.apk; for a file of this name, write ./-dash.apk");
 }
 
 TEST(Options, HelpNamesEveryOptionAndStatus) {

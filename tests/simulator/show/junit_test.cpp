@@ -69,8 +69,8 @@ TEST(Junit, HasACaseForEachFileAndCountsThem) {
           "'package: not signed: why\\n    Check --tool and --runner.'\n"
           "testcase [('classname', 'apktoolkit-sim'), ('name', 'd.apk')] ''\n"
           "system-out [] 'warning: its RSA key has 1024 bits; fewer than 2048 bits are not safe\\n"
-          "    Sign a new app with a key of 2048 bits or more. For a published one that "
-          "is another signer.'\n");
+          "    Sign a new app with a key of 2048 bits or more. For a published "
+          "app, a new key makes another signer.'\n");
 }
 
 TEST(Junit, SaysThatTheInstallerWasNotAsked) {

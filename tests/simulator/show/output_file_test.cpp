@@ -47,8 +47,8 @@ TEST(OutputFile, LeavesAnythingElseAlone) {
   for (const char* content : {"PK\3\4 and more than a list begins with", "list", " list:"}) {
     const std::string path = directory.Write("base.apk", ToBytes(content));
     EXPECT_EQ(Objection(path), "--list " + path +
-                                   " is there and holds no list of apktoolkit-sim; it is left "
-                                   "alone");
+                                   " exists and is not a list of apktoolkit-sim; it was not "
+                                   "changed");
   }
 }
 
@@ -58,7 +58,7 @@ TEST(OutputFile, LeavesAFileThatIsLookedAtAloneUnderAnyName) {
   const std::string link = directory / "link";
   ASSERT_EQ(symlink("list", link.c_str()), 0);
   EXPECT_EQ(Objection(path, {"/nowhere", link}),
-            "--list " + path + " is a file that is to be looked at; it is left alone");
+            "--list " + path + " is an input of this run; it was not changed");
 }
 
 TEST(OutputFile, IsTheSameUnderTwoNames) {

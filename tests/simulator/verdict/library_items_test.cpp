@@ -53,7 +53,7 @@ TEST(MakeReport, LibraryThatDoesNotOpenIsRefusedUnlessItIsNotThere) {
   EXPECT_EQ(item(EWOULDBLOCK, true), "refused library-leased");
   EXPECT_EQ(item(ELOOP, true),
             "refused library-not-opened ELOOP: Too many levels of symbolic links");
-  EXPECT_EQ(item(0, true), "refused library-not-opened why is not known");
+  EXPECT_EQ(item(0, true), "refused library-not-opened the reason is not known");
 }
 
 TEST(MakeReport, LibraryThatIsNotThereIsRefusedWhereTheUserIsStrict) {
