@@ -2,7 +2,6 @@
 #include "integration/caller/sign_package.h"
 
 #include <gtest/gtest.h>
-#include <sys/stat.h>
 
 #include <filesystem>
 
@@ -27,8 +26,7 @@ class Phone : public testing::Test {
 
   // Installs a script in place of a program. The script appends its own arguments to `command`.
   void InstallProgram(const std::string& name, const std::string& command) const {
-    const std::string path = bin_.Write(name, ToBytes("#!/bin/sh\n" + command + " \"$@\"\n"));
-    ASSERT_EQ(chmod(path.c_str(), 0700), 0);
+    bin_.WriteProgram(name, "#!/bin/sh\n" + command + " \"$@\"\n");
   }
 
   std::string Simulator(const std::string& options) const {

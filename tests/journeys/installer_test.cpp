@@ -2,7 +2,6 @@
 // a person reads.
 #include <gtest/gtest.h>
 
-#include <sys/stat.h>
 
 #include <filesystem>
 #include <nlohmann/json.hpp>
@@ -283,10 +282,8 @@ TEST(Installer, FileThatChangesBeforeItsAnswerHasNoResult) {
   const std::string apk = directory / "base.apk";
   std::filesystem::copy(Golden("apksigner-sha256-2048") + "/base.apk", apk);
   const auto told_with = [&](const std::string& change) {
-    const std::string java = directory.Write(
-        "java",
-        ToBytes("#!/bin/sh\nPATH=${PATH#*:}\nsleep 0.5\n" + change + "\nexec java \"$@\"\n"));
-    chmod(java.c_str(), 0755);
+    directory.WriteProgram(
+        "java", "#!/bin/sh\nPATH=${PATH#*:}\nsleep 0.5\n" + change + "\nexec java \"$@\"\n");
     return RunProcess({"bash", "-c", "PATH=\"$0:$PATH\" \"$@\"", directory.path(), SimulatorPath(),
                        "--quiet", "--installer=required", apk});
   };

@@ -136,8 +136,7 @@ TEST(ExitStatus, ThreeWhenThereIsNoTool) {
 TEST(ExitStatus, ThreeWhenTheToolIsNoProgram) {
   if (AreProgramsEmulated()) GTEST_SKIP() << "the emulator starts, and not the tool";
   const TempDir directory;
-  const std::string tool = directory.Write("tool", ToBytes("\177ELF"));
-  ASSERT_EQ(chmod(tool.c_str(), 0755), 0);
+  const std::string tool = directory.WriteProgram("tool", "\177ELF");
   const ProcessResult result = RunProcess({SimulatorPath(), "--tool", tool, "/"});
   EXPECT_EQ(result.status, 3);
   EXPECT_EQ(result.errors, "apktoolkit-sim: /: cannot start " + tool + ": Exec format error\n");
@@ -147,9 +146,7 @@ TEST(ExitStatus, ThreeWhenTheStandInsAreNotInTheTool) {
   if (AreProgramsEmulated()) GTEST_SKIP() << "the emulator hides that a program does not start";
   const TempDir directory;
   // This tool is started without the settings for the loader.
-  const std::string tool =
-      directory.Write("tool", ToBytes("#!/usr/bin/env -S -u LD_PRELOAD true\n"));
-  ASSERT_EQ(chmod(tool.c_str(), 0755), 0);
+  const std::string tool = directory.WriteProgram("tool", "#!/usr/bin/env -S -u LD_PRELOAD true\n");
   const ProcessResult result =
       RunProcess({SimulatorPath(), "--runner", "/nowhere/emulator", "--tool", tool, "/"});
   EXPECT_EQ(result.status, 3);

@@ -1,6 +1,5 @@
 // How apktoolkit-sim ends after a signal, or after the reader of its output has ended.
 #include <gtest/gtest.h>
-#include <sys/stat.h>
 #include <unistd.h>
 
 #include <csignal>
@@ -87,9 +86,7 @@ TEST(Interruption, WhileTheInstallerIsAskedIsNoAnswerOfTheInstaller) {
   const TempDir directory;
   const std::string file = directory / "base.apk", pid = directory / "pid";
   MakePackage().WriteTo(file);
-  const std::string java = directory.Write(
-      "java", ToBytes("#!/bin/sh\nsleep 0.3\necho $$ >" + pid + "\nexec sleep 60\n"));
-  ASSERT_EQ(chmod(java.c_str(), 0755), 0);
+  directory.WriteProgram("java", "#!/bin/sh\nsleep 0.3\necho $$ >" + pid + "\nexec sleep 60\n");
   const Interrupted run(pid, {"bash", "-c", "PATH=\"$0:$PATH\" exec \"$@\"", directory.path(),
                               SimulatorPath(), "--quiet", "--installer=required", file});
   EXPECT_EQ(run.ended_by, SIGTERM);

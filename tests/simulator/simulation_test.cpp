@@ -1,6 +1,5 @@
 // apktoolkit-sim and its files, its journal and its page.
 #include <gtest/gtest.h>
-#include <sys/stat.h>
 #include <unistd.h>
 
 #include <filesystem>
@@ -224,10 +223,7 @@ TEST(Simulation, WorksFromADirectoryThatTheLoaderCannotName) {
 
 // A runner that first executes the shell command `does`.
 std::string RunnerThat(const std::string& does, const TempDir& directory) {
-  const std::string runner =
-      directory.Write("runner", ToBytes("#!/bin/sh\n" + does + "\nshift\nexec env \"$@\"\n"));
-  EXPECT_EQ(chmod(runner.c_str(), 0755), 0);
-  return runner;
+  return directory.WriteProgram("runner", "#!/bin/sh\n" + does + "\nshift\nexec env \"$@\"\n");
 }
 
 TEST(Simulation, HasNoResultForAFileThatWasChangedMeanwhile) {
@@ -284,11 +280,11 @@ TEST(Simulation, RunnerGetsThePreloadForTheTool) {
   const Probe probe({"sign 3 0000"});
   // The runner handles -E as an emulator does, and prints its own arguments and LD_PRELOAD.
   const std::string runner =
-      probe.directory().Write("runner", ToBytes("#!/bin/sh\n"
-                                                "echo \"$1 $2 ${3%%=*} preload=$LD_PRELOAD\" >&2\n"
-                                                "shift 2\n"
-                                                "exec env \"$@\"\n"));
-  ASSERT_EQ(chmod(runner.c_str(), 0755), 0);
+      probe.directory().WriteProgram("runner",
+                                     "#!/bin/sh\n"
+                                     "echo \"$1 $2 ${3%%=*} preload=$LD_PRELOAD\" >&2\n"
+                                     "shift 2\n"
+                                     "exec env \"$@\"\n");
   const ProcessResult result = Simulated({"--runner", runner + " --flag", probe.path()});
   EXPECT_EQ(result.errors, "--flag -E LD_PRELOAD preload=\n");
   EXPECT_EQ(result.status, 0);

@@ -58,6 +58,12 @@ std::string TempDir::Write(const std::string& name, const Bytes& content) const 
   return path;
 }
 
+std::string TempDir::WriteProgram(const std::string& name, const std::string& content) const {
+  std::string path = Write(name, ToBytes(content));
+  if (chmod(path.c_str(), 0755) != 0) GiveUp(path);
+  return path;
+}
+
 void WriteFile(const std::string& path, const Bytes& content) {
   std::ofstream file(path, std::ios::binary);
   file.write(reinterpret_cast<const char*>(content.data()),

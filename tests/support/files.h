@@ -23,6 +23,8 @@ class TempDir {
   std::string File(const std::string& name) const;
   // Writes a file, and makes the directories above it. Returns its path.
   std::string Write(const std::string& name, const Bytes& content) const;
+  // Writes a file that everyone may execute, for example a script. Returns its path.
+  std::string WriteProgram(const std::string& name, const std::string& content) const;
 
  private:
   std::string path_;

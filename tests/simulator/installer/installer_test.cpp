@@ -2,7 +2,6 @@
 #include "simulator/installer/installer.h"
 
 #include <gtest/gtest.h>
-#include <sys/stat.h>
 
 #include <cstdlib>
 
@@ -19,8 +18,7 @@ namespace {
 class FakeJava {
  public:
   explicit FakeJava(const std::string& script) : path_(getenv("PATH")) {
-    const std::string java = directory_.Write("java", ToBytes("#!/bin/bash\n" + script));
-    chmod(java.c_str(), 0755);
+    directory_.WriteProgram("java", "#!/bin/bash\n" + script);
     setenv("PATH", (directory_.path() + ":" + path_).c_str(), 1);
   }
   ~FakeJava() { setenv("PATH", path_.c_str(), 1); }
