@@ -25,7 +25,7 @@ struct Plan {
   size_t dex_size;
   size_t entry_size;  // of each other entry
   const char* key = "rsa-2048";
-  bool in_order = true;  // sorted by name, as apksigner lists entries; else not, as jarsigner
+  bool in_order = true;  // true: sorted by name, as by apksigner; false: unsorted, as by jarsigner
 };
 
 constexpr size_t kKilo = 1000, kMega = 1000 * kKilo;

@@ -105,7 +105,7 @@ void CheckDigest(std::string_view expected, const Buffer& content) {
   uint8_t digest[EVP_MAX_MD_SIZE], text[2 * EVP_MAX_MD_SIZE];
   unsigned length = 0;
   if (EVP_Digest(content.data(), content.size(), digest, &length, EVP_sha256(), nullptr) != 1) {
-    GiveUp("no digest");
+    GiveUp("cannot compute a digest");
   }
   const int text_length = EVP_EncodeBlock(text, digest, static_cast<int>(length));
   if (expected != std::string_view(reinterpret_cast<char*>(text), static_cast<size_t>(text_length)))

@@ -169,9 +169,9 @@ bool ParseAlgorithm(Range* range, asn1_oid* oid, asn1_oid* params) {
 
 // Reads a Name (RFC 5280 §4.1.2.4). Stores the position after it in `next`. Returns 0 for success,
 // -3 for a missing SEQUENCE, -7 for a missing SET, and -8 for a missing attribute type. Returns -1
-// for an attribute value that is missing, is not universal, contains a NUL, or is one more than
-// kX509MaxAttributes. The caller returns -12 for each of these codes. `name` is empty after a
-// failure.
+// if an attribute's value is missing or not universal. Also returns -1 if a value that must be kept
+// contains a NUL, or if kX509MaxAttributes values are already kept. The caller returns -12 for each
+// of these codes. `name` is empty after a failure.
 int x509_parse_name(const uint8_t* buf, size_t len, x509_name* name, const uint8_t** next) {
   Range range = {buf, len};
   asn1_hdr hdr;
@@ -240,9 +240,9 @@ int TwoDigits(const uint8_t* digits) {
   return tens < 0 || tens > 9 || ones < 0 || ones > 9 ? -1 : tens * 10 + ones;
 }
 
-// Reads the two forms of RFC 5280 §4.1.2.5: UTC, with seconds and without fractions of a second.
-// Returns 0, or -1 for any other form. Deliberate: the tool does not use the times, so the range of
-// the numbers is not checked.
+// Reads a UTCTime or a GeneralizedTime in the form of RFC 5280 §4.1.2.5: in UTC (`Z`), with seconds
+// and without fractions of a second. Returns 0, or -1 for any other form. Deliberate: the tool does
+// not use the times, so the range of the numbers is not checked.
 int x509_parse_time(const uint8_t* value, size_t len, uint32_t tag, x509_parser_time* time) {
   constexpr size_t kAfterYear = sizeof("MMDDHHMMSSZ") - 1;
   const size_t year_digits = tag == kAsn1UtcTime ? 2 : 4;
@@ -332,10 +332,10 @@ bool ReadExtensionValue(Range extension, bool* critical, Range* value) {
   if (hdr.tag == kAsn1Boolean) {
     if (hdr.length != 1) return false;
     *critical = hdr.payload[0] != 0;
-    // Deliberate: the next header is read from the flag's own byte on. TRUE in DER is 0xFF. This
-    // byte reads as the first octet of a long-form tag of the private class. The identifier octet
-    // of the OCTET STRING then reads as the tag number. A FALSE that is written out, although DER
-    // omits it, is refused.
+    // Deliberate: the next header is read from the flag's value byte, not from the byte after it.
+    // TRUE in DER is 0xFF. This byte reads as the first octet of a long-form tag of the private
+    // class. The identifier octet of the OCTET STRING then reads as the tag number. A FALSE that is
+    // written out, although DER omits it, is refused.
     extension = After(from_flag, hdr.payload);
     if (!Next(&extension, &hdr)) return false;
     if (hdr.class_ != kAsn1Universal && hdr.class_ != kAsn1Private) return false;

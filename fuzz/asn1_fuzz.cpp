@@ -20,7 +20,7 @@ void WalkElements(const uint8_t* data, size_t size, int depth) {
       return;
     }
     Require(LiesIn(header.payload, header.length, data + position, size - position),
-            "an element lies in its range");
+            "an element is in its range");
     Require(header.payload >= data + position + 2, "a header has two bytes or more");
     if (depth < 8) WalkElements(header.payload, header.length, depth + 1);
     position = static_cast<size_t>(header.payload - data) + header.length;

@@ -23,6 +23,6 @@ extern "C" int LLVMFuzzerTestOneInput(const uint8_t* data, size_t size) {
     return 0;
   }
   out.resize(length);
-  Require(expected == out, "what fits is decoded the same way");
+  Require(expected == out, "a text that fits has the same bytes");
   return 0;
 }

@@ -95,7 +95,7 @@ extern "C" int LLVMFuzzerTestOneInput(const uint8_t* data, size_t size) {
   Require(WasPutAtMemoryEnd(), "the document's block is as large as this target expects");
   if (!parsed) {
     Require(apk.GetPackageName().empty() && !apk.IsSsPermissionRequired(),
-            "what does not parse says nothing");
+            "a document that does not parse has no facts");
     return 0;
   }
   Facts facts;

@@ -36,21 +36,21 @@ void JudgeCertificate(std::string_view bytes) {
 
 void JudgeSigningBlock(std::string_view bytes) {
   for (const NewerSigner& signer : ParseSigningBlock(bytes).signers) {
-    Require(IsPartOf(signer.certificate, bytes), "a certificate lies in the block");
+    Require(IsPartOf(signer.certificate, bytes), "a certificate is in the block");
   }
 }
 
 void JudgeSignatureBlock(std::string_view bytes) {
   const SignatureBlockFacts facts = ParseSignatureBlock(bytes);
-  Require(IsPartOf(facts.certificate, bytes), "the certificate lies in the block");
+  Require(IsPartOf(facts.certificate, bytes), "the certificate is in the block");
   Require(!facts.is_whole || facts.signer_count > 0, "a whole block has a signer");
 }
 
 void JudgeAndroidManifest(std::string_view bytes) {
   const AndroidManifest manifest = ParseAndroidManifest({bytes.begin(), bytes.end()});
-  Require(!manifest.has_overlaps || !manifest.package_name, "what is too much is not asked for");
+  Require(!manifest.has_overlaps || !manifest.package_name, "overlapping texts are not read");
   // A character of two bytes becomes at most three bytes.
-  Require(manifest.installer_name.size() <= bytes.size() * 3 / 2, "the name lies in the document");
+  Require(manifest.installer_name.size() <= bytes.size() * 3 / 2, "the name is in the document");
 }
 
 void ReadWholeFile(std::string_view bytes) {
@@ -64,7 +64,7 @@ void ReadWholeFile(std::string_view bytes) {
   Require(!facts.was_changed, "nobody changed it");
   size_t libraries = 0;
   for (const ListedEntry& each : facts.entries) libraries += kLibraryNames.Has(each.entry.name);
-  Require(libraries == facts.libraries.size(), "each library is told, damaged or not");
+  Require(libraries == facts.libraries.size(), "each library is listed, damaged or not");
   const bool has_key = facts.jar.key.has_value();
   Require(!has_key || facts.jar.key->modulus_sha256.size() == 64, "a key has its digest");
 }

@@ -1,5 +1,5 @@
-// The parts that the fuzz targets share: a way to fail, and checks of the input. Each target is one
-// file, <target>_fuzz.cpp, and one program.
+// The parts that the fuzz targets share: a way to fail, and a check that bytes are inside other
+// bytes. Each target is one file, <target>_fuzz.cpp, and one program.
 #pragma once
 
 #include <fuzzer/FuzzedDataProvider.h>

@@ -37,7 +37,7 @@ void CheckSigning(const std::deque<std::string>& texts) {
   const bool is_signed =
       std::any_of(phone.events.begin(), phone.events.end(),
                   [](const std::string& event) { return event.rfind("sign ", 0) == 0; });
-  Require(told == is_signed, "signed and told so, or neither");
+  Require(told == is_signed, "a file is signed if and only if success is reported");
   Require(told == may_sign, "a task signs when its value is settled and not 0");
 }
 

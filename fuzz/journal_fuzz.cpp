@@ -16,7 +16,7 @@ using nlohmann::json;
 
 namespace {
 
-// True if the UTF-8 text has a hidden character (IsHidden) other than a line end.
+// True if the text is not UTF-8, or has a hidden character (IsHidden) other than a line end.
 bool HasHidden(std::string_view text) {
   while (!text.empty()) {
     const size_t length = Utf8Length(text);
@@ -28,12 +28,14 @@ bool HasHidden(std::string_view text) {
 
 void JudgeText(std::string_view bytes) {
   const std::string encoded = EncodeText(bytes);
-  Require(!HasHidden(encoded) && encoded.find('\n') == std::string::npos, "all is shown");
+  Require(!HasHidden(encoded) && encoded.find('\n') == std::string::npos,
+          "the encoded text has no hidden character");
   Require(DecodeText(json::parse(encoded).get<std::string>()) == bytes, "the same bytes come back");
   DecodeText(bytes);
   for (const bool has_utf8 : {false, true}) {
     const std::string shown = Printable(bytes, {false, has_utf8});
-    Require(!HasHidden(shown) && shown.find('\n') == std::string::npos, "nothing is obeyed");
+    Require(!HasHidden(shown) && shown.find('\n') == std::string::npos,
+            "no hidden character is printed");
     const bool is_ascii = std::all_of(shown.begin(), shown.end(), [](char c) { return c >= 0; });
     Require(has_utf8 || is_ascii, "what cannot be shown is escaped");
   }
@@ -43,11 +45,11 @@ void JudgeLogLine(std::string_view bytes) {
   const std::string text(bytes);
   const LogLine line = ReadLogLine(text);
   Require(text.rfind(line.whole, 0) == 0 && text.size() - line.whole.size() <= 1,
-          "all but the end");
-  Require(text.find(line.text) != std::string::npos, "what is captured stands in the line");
+          "only the end of the line is cut off");
+  Require(text.find(line.text) != std::string::npos, "captured text is a part of the line");
   const bool is_known = line.meaning != LogMeaning::kUnknown;
   Require(is_known || (line.text.empty() && line.number == 0),
-          "nothing is captured of the unknown");
+          "an unknown line has no captured parts");
 }
 
 size_t CountOf(const Events& events, const char* kind, bool is_success) {
@@ -67,17 +69,21 @@ void JudgeRecord(const Events& events) {
     const bool was_signed = attempt.outcome == Attempt::Outcome::kSigned;
     is_signed += was_signed;
     answers += was_signed || attempt.outcome == Attempt::Outcome::kKernelRefused;
-    Require(attempt.outcome != Attempt::Outcome::kBegun, "what came to nothing is not kept");
+    Require(attempt.outcome != Attempt::Outcome::kBegun, "an attempt without a result is not kept");
     const auto has_payload = [&](const json& event) {
       return TextOf(event, "event") == "sign" && IsSuccess(event) &&
              TextOf(event, "payload") == attempt.payload;
     };
-    Require(!was_signed || std::any_of(events.begin(), events.end(), has_payload), "the payload");
+    Require(!was_signed || std::any_of(events.begin(), events.end(), has_payload),
+            "the kernel got the recorded payload");
   }
-  Require(is_signed == CountOf(events, "sign", true), "signed is what the kernel signed");
+  Require(is_signed == CountOf(events, "sign", true),
+          "as many files are signed as the kernel signed");
   Require(answers == CountOf(events, "sign", false), "each answer of the kernel is kept");
-  Require(record.registrations.size() == CountOf(events, "register", false), "each registration");
-  Require(record.verify_error != 0 || CountOf(events, "verify", true) > 0, "trusted by the kernel");
+  Require(record.registrations.size() == CountOf(events, "register", false),
+          "each registration is kept");
+  Require(record.verify_error != 0 || CountOf(events, "verify", true) > 0,
+          "only the kernel makes a JAR trusted");
 }
 
 void JudgeJournal(std::string_view bytes) {
@@ -87,7 +93,7 @@ void JudgeJournal(std::string_view bytes) {
   Require(timeline.size() <= events.size(), "a line for each event at most");
   std::ostringstream out;
   PrintTimeline(timeline, Look(), out);
-  Require(!HasHidden(out.str()), "nothing is obeyed");
+  Require(!HasHidden(out.str()), "no hidden character is printed");
 }
 
 }  // namespace

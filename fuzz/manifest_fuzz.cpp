@@ -1,4 +1,4 @@
-// apk/manifest_mf.h: any text, against a second reader.
+// apk/manifest_mf.h: parses any text. A second reader must find the same.
 #include "apk/manifest_mf.h"
 
 #include <map>

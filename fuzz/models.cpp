@@ -28,7 +28,7 @@ class Reader {
     return false;
   }
 
-  // Returns false at the end of the text.
+  // Returns false at the end of the text, and if the text is malformed.
   bool ReadSection() {
     std::map<std::string, std::string> section;
     position_ = std::min(text_.find_first_not_of(" \r\n", position_), text_.size());

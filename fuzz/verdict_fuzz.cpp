@@ -171,18 +171,21 @@ void JudgeKey(const Run& run, const PackageFacts& facts, const Report& report) {
   }
   const auto& shown = facts.jar.certificate;
   const bool is_other = shown && shown->key.modulus_sha256 != key;
-  Require(HasWarning(report, cause::kCertificateOtherKey) == is_other, "two keys are told of");
+  Require(HasWarning(report, cause::kCertificateOtherKey) == is_other,
+          "another key in the certificate is reported");
   const auto is_foreign = [&](const NewerSignerFacts& signer) {
     return signer.certificate.key.modulus_sha256 != key;
   };
   const bool has_foreign = std::any_of(facts.newer.begin(), facts.newer.end(), is_foreign);
-  Require(!has_foreign || HasWarning(report, cause::kOtherKey), "a newer signer's key");
+  Require(!has_foreign || HasWarning(report, cause::kOtherKey),
+          "another key of a newer signer is reported");
 }
 
 void JudgeItems(const Run& run, const Report& report) {
   size_t done = 0;
   for (const Item& item : report.items) {
-    Require((item.reason.cause == nullptr) == (item.state == ItemState::kDone), "a cause or done");
+    Require((item.reason.cause == nullptr) == (item.state == ItemState::kDone),
+            "an item has a cause unless it is done");
     if (item.state != ItemState::kDone) continue;
     if (item.kind != ItemKind::kKey) ++done;
     const auto& names = run.registered;
@@ -195,13 +198,14 @@ void JudgeItems(const Run& run, const Report& report) {
 void JudgeVerdict(const Run& run, const PackageFacts& facts, const Report& report) {
   const bool is_good = StatusOf(report.verdict) == kAllSigned;
   Require(!is_good || !run.granted.empty(), "the kernel signed something");
-  Require(!is_good || !run.has_failure, "what failed is told");
+  Require(!is_good || !run.has_failure, "a failure is reported");
   const bool is_refused =
       std::any_of(report.items.begin(), report.items.end(),
                   [](const Item& item) { return item.state == ItemState::kRefused; });
-  Require(!is_good || !is_refused, "what is refused is told");
+  Require(!is_good || !is_refused, "a refused item is reported");
   Require(!is_good || report.items[0].state == ItemState::kDone, "the file itself was signed");
-  Require(report.verdict == Verdict::kNotSimulated || !facts.was_changed, "a change");
+  Require(report.verdict == Verdict::kNotSimulated || !facts.was_changed,
+          "a changed file has no result");
 }
 
 // The verdict's line names the right key, and no warning contradicts it.
@@ -218,14 +222,16 @@ void JudgeShown(const Report& report) {
   Require(!why.empty() || (key != std::string::npos) == !digest.empty(), "the key is shown");
   Require(digest.empty() || head.compare(key + 6, 8, digest, 0, 8) == 0, "this key is shown");
   const bool is_got = all.str().find("what the kernel got") != std::string::npos;
-  Require(is_got == (report.key && report.key->was_got), "what the kernel got is called so");
+  Require(is_got == (report.key && report.key->was_got),
+          "a key is called the kernel's only if the kernel got it");
   const bool is_alarmed = HasWarning(report, cause::kCertificateOtherKey);
   Require(!is_alarmed || head.find("   ! ") != std::string::npos, "an alarm is in the line");
 
   const json event = json::parse(VerdictEvent(report));
-  Require(event["payload"] == report.payload, "the payload is told");
-  Require(event["status"] == static_cast<int>(StatusOf(report.verdict)), "the status is told");
-  Require(event["items"].size() == report.items.size(), "each item is told");
+  Require(event["payload"] == report.payload, "the event has the payload");
+  Require(event["status"] == static_cast<int>(StatusOf(report.verdict)),
+          "the event has the status");
+  Require(event["items"].size() == report.items.size(), "the event has each item");
 }
 
 }  // namespace

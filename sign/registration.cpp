@@ -57,8 +57,8 @@ void RegisterPackage(ApkTools::Apk& apk, int fd) {
 // Returns false if the attribute is missing, empty or unreadable.
 bool AsksForRegistration(int jar_fd) { return fgetxattr(jar_fd, "user.zu", nullptr, 0) >= 1; }
 
-// Returns 128 bytes: four SHA-256 digests. The first is the digest of the path. Each other one is
-// the digest of the one before it.
+// Returns 128 bytes: four SHA-256 digests. The first is the digest of the path. Each later digest
+// is the digest of the previous digest.
 std::vector<uint8_t> JarKeyBlock(const std::string& path) {
   constexpr size_t kBlockSize = 128;
   std::vector<uint8_t> block;

@@ -31,9 +31,8 @@ constexpr int kOtherSigner = 3;
 constexpr int kNoJarSigner = 4;
 constexpr int kNotStarted = 5;
 
-// Returns the digest of the signer's key, or an empty text if the key's signature over the
-// signature file or over its own certificate is not good. The tool makes its payload from the same
-// digest.
+// Returns the digest of the signer's key, which is also in the tool's payload. Returns an empty
+// text if the file cannot be opened, is not a package, or has no good JAR signature.
 std::string JarSigner(const char* file) {
   const ScopedFd fd(OpenForReading(file, O_CLOEXEC));
   if (fd.get() < 0) return {};

@@ -291,8 +291,8 @@ public final class InstallerVerifier {
     }
 
     // The signers of v3 and v3.1 in the signing block. Each of them is for a range of levels.
-    // Nothing is verified here. A malformed block has no signers here, and the verifier reports the
-    // error.
+    // Nothing is verified here. Signers after a malformed part of the block are not found. The
+    // verifier reports the error.
     private static final class NewerSigners {
         private static final int V3 = 0xf05368c0;
         private static final int V31 = 0x1b93ad61;

@@ -27,7 +27,8 @@ __attribute__((constructor)) void ReplaceStandardOutput() {
   stdout = stream;
 }
 
-// The C library flushes `stdout` a little later, but the process may end before that.
+// The C library flushes `stdout` after all destructors. The last output would be lost if a later
+// destructor ended the process.
 __attribute__((destructor)) void FlushStandardOutput() { fflush(stdout); }
 
 }  // namespace

@@ -20,7 +20,7 @@ namespace simulator {
 struct RunOptions {
   PhoneSettings phone;             // all but its journal and its trusted files
   std::vector<std::string> trust;  // existing files that the kernel trusts
-  std::string state;               // the directory for --state; may be empty
+  std::string state;               // the directory for --state; an empty text: none
   InstallWhen install = InstallWhen::kAlone;
   InstalledAbi abi = InstalledAbi::kPreferred;  // whose libraries are laid out
   unsigned jobs = 1;                            // how many files at a time
@@ -33,7 +33,7 @@ struct RunOptions {
 // The results of one run. MakeReport judges them.
 struct FileRun {
   RunRecord record;
-  PackageFacts facts;   // of the file where the tool found it
+  PackageFacts facts;   // of the file that the tool was given, which may be a laid-out copy
   std::string journal;  // the lines of this run, from "start" to "exit"
 };
 
@@ -45,8 +45,9 @@ class Simulator {
   // simulation can begin, else the reason why it cannot.
   std::optional<std::string> Prepare();
 
-  // Runs the tool for `file`. Does not run the tool for a walked directory that has no packages or
-  // cannot be read. Several threads may call this function if `jobs` is more than 1.
+  // Runs the tool for `file`. Does not run the tool if `file` is a directory without packages, or a
+  // part of a directory that cannot be read. The result then has only the reason. Several threads
+  // may call this function if `jobs` is more than 1.
   FileRun Run(const ListedFile& file);
 
  private:

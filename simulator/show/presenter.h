@@ -39,7 +39,8 @@ class Presenter {
   std::optional<std::string> Begin();
   // `journal`: the lines of the run, from "start" to "exit".
   void Show(const Report& report, const std::string& journal);
-  // Shows the output of a run of apktoolkit-verify. `report` says why it could not be simulated.
+  // Shows the output of a run of apktoolkit-verify. If the run could not be simulated, `report` has
+  // the reason.
   void ShowAnswer(const RunRecord& run, const Report& report, const std::string& journal);
   void ShowProgress(const std::string& file, int seconds);
   // Writes the summary, the page and the reports. `files` are all files of the command line. If the
@@ -72,7 +73,7 @@ class Presenter {
   Sarif sarif_;
   std::vector<Verdict> verdicts_;
   bool is_interrupted_ = false;  // while a file was looked at
-  size_t shown_ = 0;             // files, by a verdict or an answer
+  size_t shown_ = 0;             // the number of files whose result was shown
   bool is_progress_shown_ = false;
   std::string missing_;  // why the verifier could not be asked; empty: no such problem
   int status_ = kAllSigned;

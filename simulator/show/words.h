@@ -80,7 +80,7 @@ inline const std::string& PathForTool(const Report& report) {
 
 // For a report with `installed`.
 inline constexpr char kLaidOutText[] =
-    "libraries laid out beside it, as by an installer; --install=no turns this off";
+    "its libraries were laid out beside it, as an installer does; --install=no turns this off";
 
 // True if the cure is shown below the item. It is shown once for neighbours with the same cure, and
 // not for a consequence of another cause. `next` is the next item, or null.

@@ -271,11 +271,11 @@ inline constexpr Cause kAndroidManifestText = {"android-manifest-text", Group::k
 inline constexpr Cause kDexChanged = {"dex-changed", Group::kSignature, Severity::kRefused,
     ChainLink::kEntries, "`Integrity not confirmed: classes.dex`",
     "classes.dex is not the one that was signed", "Sign the package again, as the last step that "
-    "changes it. If nobody changed it, do not trust it."};
+    "changes it. If you did not change it yourself, do not trust it."};
 inline constexpr Cause kDexNotListed = {"dex-not-listed", Group::kSignature, Severity::kRefused,
     ChainLink::kEntries, "`Can't find file in`",
     "classes.dex is not in the manifest: it was added after signing", "Sign the package again, "
-    "as the last step that changes it. If nobody changed it, do not trust it."};
+    "as the last step that changes it. If you did not change it yourself, do not trust it."};
 inline constexpr Cause kDexDigest = {"dex-digest", Group::kSignature, Severity::kRefused,
     ChainLink::kEntries, "`verifyData:`",
     "the manifest has no digest of classes.dex that this tool reads: SHA-1 or SHA-256",
@@ -312,8 +312,8 @@ inline constexpr Cause kLibraryChanged = {"library-changed", Group::kLibrary, Se
 inline constexpr Cause kLibraryChangedInside = {"library-changed-inside", Group::kLibrary,
     Severity::kRefused, ChainLink::kEntries, "`VeltSignJni: File not verified`",
     "the package's own copy of it does not match the manifest",
-    "Sign the package again, as the last step that changes it. If nobody changed it, do not "
-    "trust it."};
+    "Sign the package again, as the last step that changes it. If you did not change it "
+    "yourself, do not trust it."};
 inline constexpr Cause kLibraryNotListed = {"library-not-listed", Group::kLibrary,
     Severity::kRefused, ChainLink::kEntries, "`Can't find file in`",
     "the manifest does not list it: it was added after signing",
@@ -339,9 +339,9 @@ inline constexpr Cause kLibraryInPackage = {"library-in-package", Group::kLibrar
     "Nothing to do: it is loaded from the package."};
 inline constexpr Cause kLibraryNotInstalled = {"library-not-installed", Group::kLibrary,
     Severity::kAbsent, ChainLink::kNone, "`Can't open file`",
-    "no libraries for its processor are beside the package", "Nothing to do for "
-    "a phone with another processor. To lay out the libraries of all "
-    "processors, give --install=all."};
+    "no libraries for its processor are beside the package", "If the phone has another "
+    "processor, there is nothing to do. To lay out the libraries of all processors, give "
+    "--install=all."};
 inline constexpr Cause kLibraryNotLaidOut = {"library-not-laid-out", Group::kLibrary,
     Severity::kNothing, ChainLink::kNone, "`Can't open file`",
     "it is for another processor than the phone's (--install=all lays out the libraries of all "
@@ -473,7 +473,7 @@ inline constexpr Cause kCertificateExpired = {"certificate-expired", Group::kWar
     "signer. For a new app, make a certificate that lasts: keytool -validity 10000."};
 inline constexpr Cause kUnlistedEntries = {"unlisted-entries", Group::kWarning, Severity::kWarning,
     ChainLink::kNone, "", "the signature does not protect %s: no digest in the manifest",
-    "Sign the package again, as the last step that changes it; --verbose lists them."};
+    "Sign the package again, as the last step that changes it. --verbose lists these entries."};
 inline constexpr Cause kNotLaidOut = {"not-laid-out", Group::kWarning, Severity::kWarning,
     ChainLink::kNone, "", "an installer leaves out %s",
     "Build the package again with its libraries as lib/ABI/NAME."};

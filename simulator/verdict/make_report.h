@@ -13,7 +13,7 @@ namespace simulator {
 
 // The user's choices for the judgement.
 struct JudgeOptions {
-  bool is_strict = false;  // absent libraries and damaged entries count as refused
+  bool is_strict = false;  // absent libraries, and damaged or encrypted entries, count as refused
   // The present time, in seconds since 1970 in UTC. Certificates that ended before it have expired.
   int64_t now = 0;
 };

@@ -26,7 +26,7 @@ int32_t Open(const char* file_name, void** archive);
 int32_t OpenFd(int fd, const char* debug_file_name, void** archive, bool assume_ownership);
 void Close(void* archive);
 int32_t Find(void* archive, std::string_view name, Entry* entry);
-// An empty filter matches every name.
+// An empty prefix matches every name, and so does an empty suffix.
 int32_t Start(void* archive, void** cookie, std::string_view prefix, std::string_view suffix);
 int32_t Advance(void* cookie, Entry* entry, std::string_view* name);
 int32_t Extract(void* archive, const Entry& entry, uint8_t* begin, uint32_t size);

@@ -246,8 +246,8 @@ TEST(Verdict, TellsWhatAProgramHasToKnowOfFileToolAndSigner) {
             RunProcess({SimulatorPath(), "--version"}).output);
   EXPECT_EQ(event["tool"], json({{"sha256", sha256(tool)}, {"version", event["version"]}}));
   EXPECT_EQ(event["items"][0]["cure"],
-            "Sign the package again, as the last step that changes it. If nobody changed it, "
-            "do not trust it.");
+            "Sign the package again, as the last step that changes it. If you did not change "
+            "it yourself, do not trust it.");
   EXPECT_EQ(
       event["signers"][0]["certificate_sha1"],
       OfCertificate("rsa-2048", "openssl x509 -in \"$0\" -outform DER | sha1sum | cut -d' ' -f1"));

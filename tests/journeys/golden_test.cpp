@@ -89,7 +89,7 @@ bool Contains(const std::string& text, const std::string& part) {
   return text.find(part) != std::string::npos;
 }
 
-// The options that made the packages had the effect that the names of the packages state.
+// Each package has the digest or the key size that its name states.
 TEST(GoldenPackages, AreWhatTheirNamesSay) {
   for (const char* name : {"apksigner-sha1-2048", "apksigner-sha1-4096"}) {
     EXPECT_TRUE(Contains(Manifest(name), "\nSHA1-Digest: ")) << name;

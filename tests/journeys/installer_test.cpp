@@ -2,7 +2,6 @@
 // a person reads.
 #include <gtest/gtest.h>
 
-
 #include <filesystem>
 #include <nlohmann/json.hpp>
 #include <sstream>

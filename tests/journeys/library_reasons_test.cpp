@@ -6,7 +6,7 @@
 namespace {
 
 constexpr char kLaidOut[] =
-    "  libraries laid out beside it, as by an installer; --install=no turns this off";
+    "  its libraries were laid out beside it, as an installer does; --install=no turns this off";
 
 TEST_F(Reason, TamperedLibrary) {
   Take("apksigner-sha256-2048");
@@ -76,8 +76,8 @@ TEST_F(Reason, LibrariesThatAreNotBesideThePackage) {
       Told(7),
       Lines({"SIGNED  base.apk" + ByRsa2048(), kSigned, "  – lib/arm64/libvault.so  " + absent,
              "  – lib/arm/libvault.so    " + absent,
-             "      Nothing to do for a phone with another processor. To lay out the libraries",
-             "      of all processors, give --install=all.",
+             "      If the phone has another processor, there is nothing to do. To lay out the",
+             "      libraries of all processors, give --install=all.",
              "  ✓ key                    registered for com.example.vault", "-> 0"}));
   EXPECT_EQ(Told(1, {"--strict"}), Lines({"PARTLY SIGNED  base.apk", "-> 1"}));
   EXPECT_EQ(Told(5, {"--install=all"}),

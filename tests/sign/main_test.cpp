@@ -1,5 +1,5 @@
-// Tests main before and around the three steps, in a process without a phone. The tool's log goes
-// to standard error.
+// Tests what main() does apart from the three steps. The tool runs without the simulated phone. The
+// tool's log goes to standard error.
 #include <gtest/gtest.h>
 #include <sys/stat.h>
 
@@ -27,7 +27,7 @@ TEST(Main, WithStandardInputTheFileIsWorkedOn) {
   EXPECT_TRUE(Says(run, "VeltSignJni starts: 3.")) << run.errors;
 }
 
-// The file then gets descriptor 0.
+// The file then gets descriptor 0, which main() refuses.
 TEST(Main, WithoutStandardInputTheFileIsLeftAlone) {
   const DiskFile file(MakePackage().Build());
   const ProcessResult run = RunTool("\"$0\" \"$1\" <&-", file.path());
@@ -55,7 +55,8 @@ TEST(Main, ALeasedFileIsWorkedOnOnceItsHolderGivesItUp) {
   EXPECT_TRUE(Says(run, "VeltSignJni finished: 0.")) << run.errors;
 }
 
-// The line is written when the process ends, after the steps.
+// The parser of the signature block prints a line about the bad block. The line stays in the buffer
+// of standard output until the process ends.
 TEST(Main, ALineThatStandardOutputCannotTakeEndsTheProcessAfterItsSteps) {
   Package package = MakePackage();
   package.Item("META-INF/CERT.RSA").data = ToBytes("no block");

@@ -27,8 +27,8 @@ bool Redirect(int number, const std::string& path, int flags) {
                      Redirect(STDOUT_FILENO, output, O_WRONLY | O_CREAT) &&
                      Redirect(STDERR_FILENO, errors, O_WRONLY | O_CREAT) &&
                      (directory.empty() || chdir(directory.c_str()) == 0);
-  // Descriptors that this process inherited, such as ctest's log, would change the command's
-  // numbers.
+  // Closes the descriptors that this process inherited, such as ctest's log. Otherwise the files
+  // that the command opens would get other descriptor numbers.
   closefrom(STDERR_FILENO + 1);
   if (ready) execvp(arguments[0], arguments.data());
   perror(arguments[0]);

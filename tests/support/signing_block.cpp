@@ -33,8 +33,8 @@ struct ArchiveParts {
 };
 
 constexpr size_t kEndRecordSize = 22;            // of the end of the central directory
-constexpr size_t kDirectoryOffsetInRecord = 16;  // the directory's offset, in that record
-constexpr size_t kCommentInRecord = 20;          // the length of the comment, in that record
+constexpr size_t kDirectoryOffsetInRecord = 16;  // where that record has the directory's offset
+constexpr size_t kCommentInRecord = 20;          // where that record has the comment's length
 
 ArchiveParts TakeApart(const Bytes& archive) {
   if (archive.size() < kEndRecordSize) abort();

@@ -400,8 +400,8 @@ TEST(Page, KeepsTheNamesOfOptionsWhole) {
   report.items = {Library("a", &cause::kLibraryNotInstalled)};
   report.items[0].state = ItemState::kAbsent;
   EXPECT_TRUE(Has(PageOf(report),
-                  "<p class=\"cure\">Nothing to do for a phone with another processor. To lay out "
-                  "the libraries of all processors, give <span "
+                  "<p class=\"cure\">If the phone has another processor, there is nothing to "
+                  "do. To lay out the libraries of all processors, give <span "
                   "class=\"option\">--install=all</span>.</p>"));
   EXPECT_TRUE(Has(PageOf(report), ".option { white-space: nowrap; }"));
 }
