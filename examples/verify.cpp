@@ -22,7 +22,7 @@ void PrintSigner(const ApkTools::Apk& apk) {
   printf("\n");
 }
 
-// A function of its own, so that the archive is released before main() closes the descriptor.
+// A separate function, so that the archive is released before main() closes the descriptor.
 bool IsGood(const char* name, int fd) {
   ApkTools::Verification verification(fd);
   const ApkTools::Reason reason = verification.reason();
