@@ -40,8 +40,12 @@ class Apk {
   //
   // `fd`: the file, open for reading. The caller keeps it open for the life of the object and
   // closes it. If `fd` is -1, Init opens `path` itself. That descriptor stays open until Release()
-  // or the end of the process.
+  // or the end of the process. If the file is no zip archive, Release() does not close that
+  // descriptor.
   // `path`: the file's name. If `path` is null, Init uses the descriptor's name in /proc.
+  //
+  // Verification fails without a message if "META-INF/MANIFEST.MF" is missing or cannot be
+  // extracted.
   //
   // The flags below show the outcome. A second call first clears the flags. Facts that the second
   // call does not reach keep their former values.
@@ -82,8 +86,8 @@ class Apk {
 
   // The steps in which Init verifies a package. Each returns true for success.
 
-  // Finds the signature file (the first entry "META-INF/….SF" in the archive's order), parses it,
-  // and verifies its signature block ("RSA" in place of "SF"). Fails without a message if the
+  // Finds the signature file (the first entry "META-INF/….SF" in the zip library's order), parses
+  // it, and verifies its signature block ("RSA" in place of "SF"). Fails without a message if the
   // package has no signature file, or if that file cannot be extracted.
   bool InitCertSf();
   // True if the certificate in `block` is signed with its own key, and the signature in `block` by
@@ -111,12 +115,13 @@ class Apk {
   // records for `name`. Mismatches and failed extractions are not logged.
   bool VerifyEntryHash(const std::string& name, ZipEntry& entry);
   // True if the file at `path` has the digest that the manifest records for the entry `name`. A
-  // mismatch is not logged. `state` and `fd` are passed to ReadFile. If `state` is not null, it
-  // receives the file's state from before the first byte was read. It is unchanged if no file was
-  // read. If `fd` is not -1, the bytes are read from `fd`.
+  // mismatch is not logged. `state` and `fd` are passed to ReadFile. If `state` is not null,
+  // `*state` becomes the file's state before the first byte was read. `*state` is unchanged if no
+  // file was read. If `fd` is not -1, the bytes are read from `fd`.
   bool VerifyFileHash(const std::string& name, const std::string& path,
                       struct stat* state = nullptr, int fd = -1);
-  // True if `name` is one of the signature's own files, which need no digest in the manifest.
+  // True if `name` is the manifest's name or one of six fixed names of signature files and blocks.
+  // These entries need no digest in the manifest.
   bool CanSkipValidation(const std::string& name);
 
  private:
@@ -136,7 +141,7 @@ class Apk {
   bool is_good_apk_ = false;
   bool dex_checked_ = false;
   bool is_good_zip_ = false;
-  EntryDigests entry_digests_;  // and the manifest that records them
+  EntryDigests entry_digests_;  // with the manifest that records them
   ManifestMf cert_sf_;
   std::vector<uint8_t> manufacturer_key_;
   bool ss_permission_required_ = false;

@@ -13,7 +13,8 @@ ManifestMf::Section::value_type DigestOf(const ManifestMf::Section& section) {
 }
 
 // std::hash is not used. In older releases of the C++ library, its unsigned arithmetic wraps and is
-// not marked as intended. A product that is built with the sanitizer for this would stop there.
+// not marked as intended. A tool that is built with the sanitizer for unsigned overflow would stop
+// there.
 size_t Hash(std::string_view name) {
   size_t hash = 0;
   for (const char c : name) hash = (hash << 9 | hash >> 55) ^ static_cast<uint8_t>(c);
@@ -35,13 +36,14 @@ void EntryDigests::List() {
   bool in_order = true;
   for (uint32_t i = 0; i < sections.size(); ++i) {
     const std::string_view name = NameOf(i);
-    // This also leaves out the main section, which names no entry.
+    // This also leaves out the main section, which normally has no name.
     if (name.empty() || DigestOf(sections[i]).first.empty()) continue;
     in_order = in_order && last <= name;
     last = name;
     sections_.push_back(i);
   }
-  // apksigner writes names in order. Older tools write them in the order of the archive.
+  // apksigner writes the names in order. Other tools, such as jarsigner, write them in the order of
+  // the archive.
   if (!in_order) Sort();
 }
 

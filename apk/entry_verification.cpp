@@ -19,7 +19,8 @@ bool Apk::IsGoodApk() {
   return is_good_apk_;
 }
 
-// Returns true if the package does not have this entry, and false if the entry cannot be read.
+// True if classes.dex has the digest that the manifest records, or if the package has no such
+// entry. False if the entry cannot be looked up or read.
 bool Apk::VerifyDex() {
   ZipEntry dex;
   const int32_t result = FindZipEntry(zip_handle_, "classes.dex", &dex);

@@ -31,7 +31,7 @@ bool IsPlainText(const uint8_t* eight) {
 // The parser is lenient where signing tools differ. Lines may have any length, and end with CR LF,
 // LF CR, CR or LF. A line without a colon becomes part of the next name. The parser is strict about
 // the byte after a colon. Unusual line breaks decide which digest belongs to which entry, so tests
-// pin how they are read.
+// pin how the parser reads them.
 class Parser {
  public:
   Parser(std::vector<uint8_t>& text, ManifestSections& sections)
@@ -57,8 +57,8 @@ class Parser {
   };
 
   // Deliberate: no step sets any other state, so no test can reach this message. The guard is kept
-  // for a state that is added later without a case in step(): that state cannot make a manifest
-  // pass.
+  // for a state that is added later without a case in step(). With the guard, a manifest that
+  // reaches that state is refused.
   bool isExpectedState() const {
     const bool is_expected = state_ <= P_EOL;
     if (!is_expected) LogError("Parse manifest: Unexpected state.\n");
@@ -101,7 +101,7 @@ class Parser {
     while (byteAt(end) != ':' && byteAt(end) != '\0') ++end;
     pending_.name = readTo(end);
     if (byteAt(end) == '\0') {
-      // A log record keeps at most this part of a long name.
+      // A log record has no space for more of a long name.
       const size_t shown = std::min<size_t>(pending_.name.length, kLogTextSize);
       const std::string name(reinterpret_cast<const char*>(text_) + pending_.name.start, shown);
       LogError("Parse manifest: Error: P_KEY: unexpected end of file after key '%s'\n",

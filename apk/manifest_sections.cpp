@@ -42,9 +42,10 @@ ManifestSection ManifestSections::operator[](size_t index) const {
 }
 
 void ManifestSections::reset(const uint8_t* text, size_t size) {
-  // The table is reserved at once, because a table that grows in steps wastes its former memory.
-  // Reserved memory is used only when it is filled. Few attributes take fewer than kShortAttribute
-  // bytes of text. kManyAttributes can list all entries of any archive.
+  // The table is reserved at once, because a table that grows in steps wastes the memory of its
+  // former sizes. Reserved memory is in use only after the table has filled it. Few attributes take
+  // fewer than kShortAttribute bytes of text. kManyAttributes are enough for two attributes of each
+  // of the 65,535 entries that an archive without zip64 can have.
   constexpr size_t kShortAttribute = 32;
   constexpr size_t kManyAttributes = 1 << 17;
   text_ = reinterpret_cast<const char*>(text);
@@ -57,7 +58,7 @@ void ManifestSections::reset(const uint8_t* text, size_t size) {
 // Sorting a section drops repeated names. The section is sorted again only after the text has
 // advanced by kLittleText plus, for each name, the name's length and kTwoAttributes. kTwoAttributes
 // is the length of the text of two short attributes. Repeated names therefore take no more memory
-// than others, and long names are not compared again after every few bytes.
+// than different names, and long names are not compared again after every few bytes.
 void ManifestSections::add(const ManifestAttribute& attribute) {
   constexpr size_t kTwoAttributes = 10;
   attributes_.push_back(attribute);
@@ -75,7 +76,8 @@ void ManifestSections::endSection() {
   patience_ = kLittleText + (attributes_.empty() ? 0 : attributes_.back().name.start);
 }
 
-// Sorts the open section by name. Of equal names it keeps the one that is last in the text.
+// Sorts the open section by name. Of attributes with equal names, keeps only the last one in the
+// text.
 void ManifestSections::order() {
   const auto name = [this](const ManifestAttribute& a) { return View(text_, a.name); };
   const auto is_out_of_order = [&](const ManifestAttribute& a, const ManifestAttribute& b) {

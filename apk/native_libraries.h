@@ -1,5 +1,6 @@
-// Finds a package's native libraries on disk. Maps each ABI directory in the archive to the
-// directory beside the package to which the installer extracts it. Keeps no state and logs nothing.
+// The paths on disk of a package's native libraries. A table maps the ABI directories in the
+// archive to the directories beside the package into which the installer extracts the libraries.
+// The functions keep no state and log nothing.
 #pragma once
 
 #include <string>

@@ -45,7 +45,7 @@ bool Apk::InitCertSf() {
   return true;
 }
 
-// Deliberate: of several signature files only the first in the archive's order counts.
+// Deliberate: of several signature files, only the first in the zip library's order counts.
 bool Apk::ExtractSignatureFile(std::string& name, std::vector<uint8_t>& content) {
   void* cookie;
   if (StartIteration(&cookie, "META-INF/", ".SF") != 0) return false;
@@ -91,8 +91,8 @@ bool Apk::VerifyCertificate(std::vector<uint8_t>& block, std::vector<uint8_t>& s
     LogError("RSA could not verify data: %X\n", static_cast<unsigned>(result));
     return false;
   }
-  // Deliberate: longer keys never verify above, so no test reaches this line. The guard protects
-  // the code that uses the key, which has no space for a longer key.
+  // Deliberate: longer keys never verify above, so no test reaches this line. The guard limits the
+  // key's length even if the limit of rsa_pkcs1_verify is raised later.
   if (record.modulus_length > kLongestKey) return false;
   key.assign(record.modulus, record.modulus + record.modulus_length);
   return true;
@@ -110,7 +110,8 @@ bool Apk::ValidateManifest(const std::vector<uint8_t>& manifest) {
     const std::string digest_name(name.substr(0, name.size() - kManifest.size()));
     const std::vector<uint8_t> expected = Base64Decode(std::string(value));
     if (!expected.empty() && VerifyData(digest_name, expected, manifest)) return true;
-    // Deliberate: the first section with a digest decides. A later one cannot repair it.
+    // Deliberate: the first section with a digest decides. If its digest is wrong, a later section
+    // does not count.
     break;
   }
   LogError("Can't validate manifest.\n");
@@ -119,9 +120,9 @@ bool Apk::ValidateManifest(const std::vector<uint8_t>& manifest) {
 
 bool Apk::VerifyData(const std::string& digest_name, const std::vector<uint8_t>& expected,
                      const std::vector<uint8_t>& data) {
-  // Deliberate: only these two digests are supported. Every manifest that a package's signing tool
-  // wrote has one of them. Others (MD5, SHA-512) are refused. The rule for signatures is different:
-  // old packages have signatures over MD5 digests, and these signatures verify.
+  // Deliberate: only these two digests are supported. apksigner writes one of them into every
+  // manifest. Other digests (MD5, SHA-512) are refused. The rule for signatures is different: old
+  // packages have signatures over MD5 digests, and these signatures verify.
   std::vector<uint8_t> computed;
   if (digest_name == "SHA1-Digest") {
     ComputeSHA1Digest(data, computed);

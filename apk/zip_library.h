@@ -1,4 +1,5 @@
-// The functions of the platform's zip library that the tool calls, in one form for all releases.
+// The functions of the platform's zip library that accept or return names, in one form for all
+// releases.
 //
 // The library has two generations. Its functions accept names as `ZipString` up to API 29, and as
 // std::string_view later. Only this file depends on the difference. The library owns archives,
@@ -31,7 +32,7 @@ ZipString ZipNameFor(...);
 using ZipName = decltype(ZipNameFor(static_cast<ZipEntry*>(nullptr)));
 
 // The templates below are for `ZipString`, or for a test's type with the same fields. A name points
-// into its text.
+// to text that it does not own.
 
 inline void SetZipName(std::string_view& name, const std::string& text) { name = text; }
 // Sets the fields one by one: the constructor from a C string would stop at a NUL and abort on a

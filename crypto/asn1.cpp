@@ -38,7 +38,7 @@ int asn1_get_next_bounded(const uint8_t* buf, size_t available, size_t bound, as
   if (!ReadIdentifier(&octets, hdr) || !ReadLength(&octets, hdr)) return -1;
 
   const size_t header_length = readable - octets.left;
-  // Deliberate: the remaining length is cut to 32 bits, because every length here has 32 bits.
+  // Deliberate: the remaining length is cut to 32 bits, because the header's length has 32 bits.
   const auto remaining = static_cast<uint32_t>(bound - header_length);
   if (hdr->length > remaining) return -1;
   hdr->payload = octets.position;

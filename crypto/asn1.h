@@ -24,7 +24,7 @@ inline constexpr uint32_t kAsn1GeneralizedTime = 24;
 
 // One header, decoded.
 struct asn1_hdr {
-  const uint8_t* payload;  // first byte of the contents; null when the header could not be read
+  const uint8_t* payload;  // first byte of the contents; null after a failure
   uint8_t identifier;      // the first identifier octet, unchanged
   uint8_t class_;          // its bits 8 and 7
   uint8_t constructed;     // its bit 6
@@ -42,8 +42,8 @@ struct asn1_oid {
 
 // Reads the header at the start of the `len` bytes at `buf` into `hdr`. The element must end within
 // those bytes. Identifier and length octets need not be minimal. The low 32 bits of a long tag
-// number are kept. The indefinite form reads as length 0. Fails for more than four length octets,
-// and for the reserved first length octet 0xFF.
+// number are kept. The indefinite form reads as length 0. Fails for more than four subsequent
+// length octets, and for the reserved first length octet 0xFF.
 //
 // After a failure, `hdr` contains the fields that were decoded before the failure. Its payload is
 // null.

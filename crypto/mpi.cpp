@@ -198,7 +198,8 @@ int mpi_mod_mpi(mpi* R, const mpi* A, const mpi* B) {
   if (mpi_compare_abs(&X, B) >= 0) {
     if (const int result = reduce(&X, B)) return result;
   }
-  // The magnitude is now below the divisor's, so one addition makes a negative remainder positive.
+  // The magnitude is now below the divisor's, so adding the divisor once makes a negative remainder
+  // positive.
   if (sign_of(&X) < 0) {
     if (const int result = mpi_sub_abs(&X, B, &X)) return result;
   }
@@ -216,12 +217,13 @@ WRAPS_ON_PURPOSE void mpi_montmul(mpi* A, const mpi* B, const mpi* N, unsigned i
     const uint32_t u1 = (d[0] + u0 * B->p[0]) * mm;
     mpi_mul_hlp(m, B->p, d, u0);
     mpi_mul_hlp(n, N->p, d, u1);
-    // The two products made this limb of T zero, so it can store another value.
+    // The two products made this limb of T zero. The limb is not part of the result, so it can
+    // store another value.
     *d++ = u0;
   }
   for (int i = 0; i <= n; ++i) A->p[i] = d[i];
 
-  // Deliberate: n limbs are always subtracted, so that the time does not depend on the product. A
+  // Deliberate: n limbs are always subtracted, so that both cases take about the same time. A
   // product below N is subtracted from T, whose limbs are not read again. T contains the product
   // above its lowest n limbs, so T is not less than the product and absorbs the borrow.
   if (mpi_compare_abs(A, N) >= 0) {
@@ -238,7 +240,7 @@ void release_limbs(mpi* X) {
   clear_limbs(X);
   // A compiler may drop a store to memory that is about to be freed. The compiler must assume that
   // the empty assembly reads these zeros, and so it stores them. No test can check this, because
-  // gcc 12 and clang 14 store them anyway.
+  // gcc 12 and clang 14 store the zeros even without the assembly.
   __asm__ __volatile__("" : : "r"(X->p) : "memory");
   free(X->p);
 }
@@ -331,7 +333,7 @@ WRAPS_ON_PURPOSE uint32_t multiply_add(const uint32_t* s, uint32_t* d, uint32_t 
   return c;
 }
 
-// X = abs(X) mod abs(B) with the sign of X, for abs(X) >= abs(B) > 0. Long division by 32-bit
+// X = abs(X) mod abs(B) with the sign of X, for abs(X) >= abs(B) > 0. Long division with 32-bit
 // digits leaves the remainder in place of the dividend and drops the quotient (Knuth, The Art of
 // Computer Programming, volume 2, 4.3.1, algorithm D).
 WRAPS_ON_PURPOSE int reduce(mpi* X, const mpi* B) {

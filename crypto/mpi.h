@@ -1,9 +1,10 @@
-// Multi-precision integers, just large enough for the RSA public operation.
+// Multi-precision integers for the RSA public operation.
 //
 // A number owns its limbs. The limbs are allocated by malloc, and overwritten with zeros before
 // they are freed or replaced. Arguments must not be null. The same number may be passed as several
 // arguments of an operation only if the operation's comment allows it. Operations that allocate
-// return kMpiNoMemory if malloc fails; their result is then in a valid state. Nothing here logs.
+// return kMpiNoMemory if malloc fails. The number that receives the result is then in a valid
+// state. The functions log nothing.
 #pragma once
 
 #include <cstddef>
@@ -12,7 +13,7 @@
 // A signed integer in sign-magnitude form, shorter than 2^31 bits. The magnitude may have any
 // number of zero limbs at its top.
 struct mpi {
-  int32_t s;    // the sign: +1 or -1; of a zero normally +1
+  int32_t s;    // the sign: +1 or -1; normally +1 if the number is zero
   int32_t n;    // number of limbs allocated in `p`
   uint32_t* p;  // the magnitude, least significant limb first; null when `n` is 0
 };
@@ -26,7 +27,7 @@ inline constexpr int kMpiBufferTooSmall = 8;
 inline constexpr int kMpiNegativeResult = 16;
 inline constexpr int kMpiDivisionByZero = 18;
 
-// Sets each number to the empty value: sign +1, no limbs. Does not free limbs that a number held
+// Sets each number to the empty value: sign +1, no limbs. Does not free limbs that a number had
 // before. The list ends with a null pointer.
 void mpi_init(mpi* X, ...) __attribute__((sentinel));
 
@@ -48,7 +49,7 @@ struct mpi_owner : Record {
 };
 using mpi_local = mpi_owner<mpi>;
 
-// Grows X to at least `nblimbs` limbs. New limbs are zero. Never shrinks X. On failure X is
+// Grows X to at least `nblimbs` limbs. New limbs are zero. Never shrinks X. After a failure, X is
 // unchanged.
 int mpi_grow(mpi* X, int nblimbs);
 

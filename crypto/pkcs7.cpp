@@ -12,7 +12,8 @@
 
 namespace {
 
-// The block. A position in it is an offset from its start, which may be beyond its end.
+// The signature block. A position is an offset from the start of the block, and may be beyond its
+// end.
 struct Block {
   const uint8_t* bytes;
   size_t length;
@@ -88,8 +89,8 @@ WRAPS_ON_PURPOSE bool ReadHeaders(const Block& block, asn1_hdr* hdr) {
       block.Read(block.Skip(*hdr), block.length, hdr)) {   // the [0] of the certificates
     return true;
   }
-  // Deliberate: the payload of an unreadable header is null. The printed offset is therefore the
-  // distance from the block to the null address.
+  // Deliberate: the payload of an unreadable header is null. The printed offset is therefore 0
+  // minus the address of the block.
   const uintptr_t offset =
       reinterpret_cast<uintptr_t>(hdr->payload) - reinterpret_cast<uintptr_t>(block.bytes);
   return Fail("CANT PROCESS CERTIFICATE TAG = %d, offset = %p", static_cast<int>(hdr->tag),
@@ -126,8 +127,8 @@ bool ReadPublicKey(const Block& block, const x509_certificate& certificate, pkcs
   record->modulus = modulus.payload + zeros;
   record->modulus_length = modulus.length - zeros;
 
-  // Deliberate: the exponent's length is compared with the length of the modulus, not with the rest
-  // of the key. The exponent is copied, so its contents must be inside the block.
+  // Deliberate: the bound for the exponent, header included, is the length of the modulus, not the
+  // rest of the key. The exponent is copied, so its contents must be inside the block.
   asn1_hdr exponent;
   if (!block.Read(block.Skip(modulus), modulus.length, &exponent)) return Fail(kUnreadable);
   if (exponent.tag != kAsn1Integer) return Fail(kNotAnInteger);
@@ -136,9 +137,9 @@ bool ReadPublicKey(const Block& block, const x509_certificate& certificate, pkcs
   return true;
 }
 
-// Deliberate: an exponent of more than four bytes overwrites the modulus length, which follows the
-// exponent in the record. Bytes after the eighth are dropped. Exponents in use have at most three
-// bytes. The maker of an exponent of more than four bytes also sets the modulus length.
+// Deliberate: the fifth to the eighth byte of an exponent overwrite the modulus length, which
+// follows the exponent in the record. Later bytes are dropped. Exponents in use have at most three
+// bytes. An attacker can choose the modulus length in this way, so the caller must check it.
 void StoreExponent(const asn1_hdr& exponent, pkcs7* record) {
   constexpr size_t kStart = offsetof(pkcs7, exponent);
   constexpr size_t kEnd = offsetof(pkcs7, modulus_length) + sizeof(record->modulus_length);
@@ -164,10 +165,11 @@ bool ReadSigner(const Block& block, const asn1_hdr& certificates, pkcs7* record)
     return Fail("PUBLIC KEY ERROR: parse algorithm identifier");
   }
 
-  // Deliberate: the elements are found by position, and their tags are not checked. If a SignerInfo
-  // has authenticated attributes, its digestEncryptionAlgorithm is read as the encryptedDigest and
-  // does not verify. Its real signature would not cover the signature file itself. The lengths are
-  // compared with the distance from the start of the block to the end of the digestAlgorithm.
+  // Deliberate: the next two elements are found by position, and their tags are not checked. If a
+  // SignerInfo has authenticated attributes, its digestEncryptionAlgorithm is read as the
+  // encryptedDigest and does not verify. The real signature covers only the attributes, not the
+  // signature file itself. The bound for both elements is the distance from the start of the block
+  // to the end of the digestAlgorithm.
   const size_t bound = block.Skip(algorithm);
   asn1_hdr encryption, digest;
   if (!block.Read(bound, bound, &encryption) ||
@@ -179,8 +181,8 @@ bool ReadSigner(const Block& block, const asn1_hdr& certificates, pkcs7* record)
   return true;
 }
 
-// Reads the AlgorithmIdentifier at `offset`, which must end at or before `end`. Its digest
-// algorithm does not matter: the signature itself names its digest algorithm.
+// Reads the AlgorithmIdentifier at `offset`, which must end at or before `end`. It may name any
+// algorithm, because the signature itself names its digest algorithm.
 bool ReadDigestAlgorithm(const Block& block, size_t offset, size_t end, asn1_hdr* algorithm) {
   asn1_oid oid;
   const uint8_t* next;

@@ -9,23 +9,25 @@
 
 // Lengths in bytes, numbers big-endian.
 struct pkcs7 {
-  const uint8_t* modulus;         // of the certificate's RSA key, without one leading zero byte
+  const uint8_t* modulus;         // of the certificate's RSA key; one leading zero byte is left out
   const uint8_t* cert_signature;  // the certificate's signatureValue
   const uint8_t* signed_digest;   // the SignerInfo's encryptedDigest
   const uint8_t* tbs_data;        // the certificate's tbsCertificate, header included
   uint32_t tbs_data_length;
   uint32_t cert_signature_length;
   uint32_t signed_digest_length;
-  uint8_t exponent[4];  // the public exponent's bytes in order, then zeros
+  uint8_t exponent[4];  // the public exponent's first bytes in order, then zeros
   uint32_t modulus_length;
 };
 
 // Reads the `length` bytes at `block` into `record`, which the caller has cleared. Uses the first
 // certificate and the first SignerInfo, and does not check that they belong together. Returns 0 for
-// success and 1 for failure. After a failure, `record` keeps the fields that were stored before.
+// success and 1 for failure. After a failure, `record` keeps the fields that were stored before the
+// failure.
 //
-// Outer lengths are trusted: they are not compared with the enclosing element. The `modulus_length`
-// bytes at `modulus` and the `signed_digest_length` bytes at `signed_digest` may end beyond the
-// block, so the caller must check them. The bytes at `cert_signature` and `tbs_data` are inside the
-// block.
+// The lengths of outer elements are trusted: they are not compared with the end of the enclosing
+// element. If the exponent has more than four bytes, its fifth to eighth byte overwrite
+// `modulus_length`. The `modulus_length` bytes at `modulus` and the `signed_digest_length` bytes at
+// `signed_digest` may end beyond the block, so the caller must check them. The bytes at
+// `cert_signature` and `tbs_data` are inside the block.
 int processCert(const uint8_t* block, uint32_t length, pkcs7* record);

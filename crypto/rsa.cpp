@@ -121,7 +121,7 @@ bool holds(const uint8_t* info, const uint8_t* prefix, size_t prefix_size, const
   return memcmp(info, prefix, prefix_size) == 0 && memcmp(info + prefix_size, digest, size) == 0;
 }
 
-// Deliberate: three algorithms share the prefix, and only MD5 is supported. A different prefix is
+// Deliberate: MD2, MD4 and MD5 share the prefix, but only MD5 is supported. A different prefix is
 // not logged.
 int check_md5(uint8_t* info, const uint8_t* md5) {
   const uint8_t algorithm = info[kMdAlgorithmIndex];

@@ -1,7 +1,7 @@
 // RSA PKCS#1 v1.5 signature verification (RFC 8017 §8.2.2) on the tool's own integers.
 //
-// A context owns the limbs of its two numbers; an rsa_local releases them. Bytes that are passed in
-// are only read during the call. A refused DigestInfo is logged at error priority, except a
+// A context owns the limbs of its two numbers; an rsa_local releases them. No pointer to the
+// caller's bytes is kept after a call. A refused DigestInfo is logged at error priority, except a
 // DigestInfo of MD5's length with another prefix. Every other refusal is silent.
 #pragma once
 
@@ -23,14 +23,14 @@ inline void mpi_apply(void (*call)(mpi* X, ...), rsa_context* ctx) {
 // A context that starts empty and is released when its scope ends.
 using rsa_local = mpi_owner<rsa_context>;
 
-// The least and the greatest length of a modulus that verifies, in bytes.
+// The least and the greatest length, in bytes, of a modulus that rsa_pkcs1_verify accepts.
 inline constexpr uint32_t kRsaMinModulusSize = 16;
 inline constexpr uint32_t kRsaMaxModulusSize = 512;
 
 // True if anyone can forge signatures for a key with this exponent. The caller must refuse these
 // keys. Deliberate: only 1 and -1 are refused. The arithmetic ignores the exponent's sign
 // (mpi_pow_mod). A number to the power of 1 is itself, so anyone could write a valid signature for
-// any key (docs/decisions/exponent-of-one.md).
+// any modulus (docs/decisions/exponent-of-one.md).
 constexpr bool rsa_is_forgeable(uint32_t exponent_value) {
   return exponent_value == 1 || exponent_value == UINT32_MAX;
 }
@@ -42,14 +42,16 @@ inline constexpr int kRsaVerifyFailed = 18;
 inline constexpr int kRsaKeyFlag = 8;
 inline constexpr int kRsaPublicFlag = 16;
 
-// Loads a public key into `ctx`, which is not null. Limbs that `ctx` owned before are not freed.
+// Loads a public key into `ctx`, which must not be null. Limbs that `ctx` owned before are not
+// freed.
 //
-// `modulus` is unsigned, big-endian, `len` bytes; null leaves the modulus empty. `exponent` has the
-// same form and length. If `exponent` is null, the exponent is `exponent_value`, read as a signed
-// number. A `len` of 0 leaves both numbers empty and does not change the context's `len`. A context
-// with an empty modulus verifies nothing.
+// `modulus` is unsigned, big-endian, and has `len` bytes. If it is null, both numbers stay empty.
+// `exponent` has the same form and length. If `exponent` is null, the exponent is `exponent_value`,
+// read as a signed number. A `len` of 0 leaves both numbers empty and does not change the context's
+// `len`. A context with an empty modulus verifies nothing.
 //
-// Returns 0, or kRsaKeyFlag | kMpiNoMemory (9) with both numbers empty.
+// Returns 0, or kRsaKeyFlag | kMpiNoMemory (9) with both numbers empty. If memory runs out only for
+// `exponent_value`, returns 0 and leaves the exponent empty: the key then verifies nothing.
 int rsa_set_key(rsa_context* ctx, const uint8_t* modulus, const uint8_t* exponent,
                 uint32_t exponent_value, uint32_t len);
 

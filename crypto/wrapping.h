@@ -1,9 +1,9 @@
 // Marks arithmetic that wraps on purpose.
 #pragma once
 
-// Declares that a function computes unsigned sums and products modulo 2^32 and handles the carries
-// itself. scripts/check fails for an unsigned overflow in any other function. The mark has no other
-// effect.
+// Declares that unsigned arithmetic in a function may wrap. The function handles carries itself, or
+// needs the wrapped value. scripts/check fails for an unsigned overflow in any other function of
+// the tool. The mark has no other effect.
 #ifdef __clang__
 #define WRAPS_ON_PURPOSE __attribute__((no_sanitize("unsigned-integer-overflow")))
 #else

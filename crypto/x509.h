@@ -8,7 +8,8 @@
 
 #include "crypto/asn1.h"
 
-// A UTCTime or GeneralizedTime as written. The numbers are not checked; `year` has four digits.
+// A UTCTime or GeneralizedTime as written. The ranges of the numbers are not checked. `year` is the
+// full year, also for a UTCTime.
 struct x509_parser_time {
   uint16_t year;
   uint8_t month, day, hour, minute, second;
@@ -28,7 +29,7 @@ enum : uint32_t {
 
 struct x509_name_attribute {
   uint32_t type;
-  const uint8_t* value;  // not NUL-terminated, and free of NUL bytes
+  const uint8_t* value;  // contains no NUL, and is not NUL-terminated
   uint64_t value_length;
 };
 
@@ -64,7 +65,7 @@ struct x509_certificate {
   x509_certificate* next;                        // for chains of records; left null
   uint32_t version;                              // 0 = v1, 1 = v2, 2 = v3
   uint32_t serial_number;                        // the low 32 bits
-  asn1_oid signature_oid, signature_params_oid;  // of the tbsCertificate; parameters if an OID
+  asn1_oid signature_oid, signature_params_oid;  // of the tbsCertificate; params only if an OID
   x509_name issuer;
   x509_name subject;
   x509_parser_time not_before, not_after;
@@ -87,17 +88,18 @@ struct x509_certificate {
 // Reads the certificate at the start of the `len` bytes at `buf` into `cert`. Bytes after it are
 // ignored. Returns 0, or
 //   -2   `buf` or `cert` is null, or `len` is 0
-//   -3   the Certificate or the tbsCertificate is not a SEQUENCE
-//   -4   the signatureValue is not a BIT STRING
+//   -3   the Certificate or the tbsCertificate cannot be read or is not a SEQUENCE
+//   -4   the signatureValue cannot be read or is not a BIT STRING
 //   -5   a header of the version, the serialNumber or the optional fields cannot be read, the first
 //        optional field is not context-specific, or the signatureValue is empty
 //   -6   the signatureValue has unused bits
 //   -9   the version is not v1, v2 or v3
 //   -10  the serialNumber is not an INTEGER
 //   -11  a signature's AlgorithmIdentifier is malformed
-//   -12  the issuer or the subject is malformed
+//   -12  the issuer or the subject is malformed, or has more attributes than a record keeps
 //   -13  the validity is malformed
 //   -14  the subjectPublicKeyInfo is malformed
 //   -15  an extension is malformed, is critical and unknown, or is in a v2 certificate
-// After a failure, `cert`, if it is not null, keeps the fields that were read before the failure.
+// After -2, `cert` is unchanged. After any other failure, it contains the fields that were read
+// before the failure.
 int x509_certificate_parse(const uint8_t* buf, size_t len, x509_certificate* cert);

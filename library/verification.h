@@ -27,13 +27,13 @@ enum class Reason {
   kNoRsaBlock,                 // the signature block "*.RSA" is missing, or cannot be extracted
   kBlockMalformed,             // the block does not parse, or its key is not RSA
   kKeyRefused,                 // the key is cut off, or has the exponent 1 or -1
-  kCertificateRefused,         // the certificate is not self-signed, or its digest is SHA-384 etc.
+  kCertificateRefused,         // not signed with its own key, or its key or digest is unsupported
   kSignatureRefused,           // the block's signature does not cover the signature file
   kManifestRefused,            // the signature file has no digest of the manifest, or a wrong one
   kManifestMalformed,          // the manifest does not parse
   kAndroidManifestMalformed,   // "AndroidManifest.xml" is not compiled XML
   kDexRefused,                 // "classes.dex" is not what the manifest lists
-  kUnknown,                    // the file is refused, and no logged line gives a known reason
+  kUnknown,                    // the file is refused, and no line in the log gives a known reason
 };
 
 // The reason as the end of a sentence such as "refused: …", in English. The text is static.

@@ -29,7 +29,7 @@ uint32_t VeltVerifyFd(int fd);
 //
 // If bit 0 of `wait` is set, reads again every 10 ms while the value is 0xFFFFFFFF (not settled
 // yet), and stores each value in `*value`. Fails if `value` is null, if `pid` is negative, or if
-// the task's file cannot be opened or does not contain a hexadecimal number. After a failure,
+// the task's file cannot be opened or does not begin with a hexadecimal number. After a failure,
 // `*value` has its former value, or the last value that was read while waiting.
 uint32_t VeltTaskReadIntegrity(int pid, uint32_t wait, uint32_t* value);
 

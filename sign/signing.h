@@ -4,7 +4,7 @@
 // not close the descriptors.
 //
 // Payload of a package: a 16-bit length (32, host byte order) and the SHA-256 digest of the
-// signer's key. Payload of a plain JAR: the 16-bit length 0, no data.
+// signer's RSA modulus. Payload of a plain JAR: the 16-bit length 0, no data.
 #pragma once
 
 #include <cstdint>
@@ -13,7 +13,7 @@
 
 // Signs the file behind `fd`: a good package, or a plain JAR that the kernel already trusts.
 // `zip_fd` appears only in messages. Returns kVeltFailure if the file is not a zip archive, if the
-// package did not verify, or if the kernel does not trust the JAR or refuses to sign.
+// package did not verify, if the kernel does not trust the JAR, or if VeltSignFd fails.
 uint32_t VeltSign(ApkTools::Apk& apk, int zip_fd, int fd);
 
 // Signs the native libraries that were extracted beside the package `apk`. `fd` appears only in a

@@ -1,6 +1,6 @@
 // One-shot digests of bytes in memory, by the platform's crypto library: MD5 (RFC 1321), SHA-1 and
 // SHA-256 (FIPS 180-4). The functions keep no state, log nothing and cannot fail. The caller owns
-// both vectors, which must not be the same one.
+// both vectors. They must be two different vectors.
 #pragma once
 
 #include <cstdint>

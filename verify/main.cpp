@@ -81,8 +81,8 @@ bool AskKernel(int fd) {
   return true;
 }
 
-// A path may contain any byte except NUL. Control characters and the backslash are printed as \xHH,
-// so that a path cannot end the line or control a terminal.
+// A path may contain any byte except NUL. The control characters of ASCII and the backslash are
+// printed as \xHH, so that a path cannot end the line or send ESC to a terminal.
 void PrintPath(const char* path) {
   for (; *path != '\0'; ++path) {
     const auto byte = static_cast<unsigned char>(*path);

@@ -4,8 +4,8 @@
 // /system/bin. The program prints the outcome for each package.
 //
 // Files that the kernel already trusts are left out, so an interrupted run can be started again.
-// Exit status: 0 if all packages are trusted, 1 if some are not, 2 if the command line or the list
-// is wrong.
+// Exit status: 0 if all packages are trusted, 1 if some are not, 2 if the command line is wrong,
+// the list cannot be opened, or one of its lines is malformed.
 #include <algorithm>
 #include <cerrno>
 #include <cstdio>

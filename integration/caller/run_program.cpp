@@ -12,11 +12,12 @@
 
 namespace {
 
-// The exit status of a child that could not exec the program. The kit's programs use lower numbers.
+// The exit status of a child that could not set its memory limit or exec the program. The kit's
+// programs use lower numbers.
 constexpr int kCannotBecome = 127;
 
-// Everything that the child needs. It is made before the fork: the child of a process with several
-// threads must not wait for a lock, so it must not allocate memory.
+// Everything that the child needs. It is made before the fork. If the process has several threads,
+// its child must not wait for a lock, and therefore must not allocate memory.
 struct Child {
   std::vector<char*> arguments;  // ends with a null pointer
   int null;                      // /dev/null, behind the standard streams
@@ -58,8 +59,8 @@ std::vector<char*> Arguments(const std::vector<std::string>& command) {
 }
 
 // Opens /dev/null with a number above the standard streams, even if this process has no standard
-// streams. If the number were that of a stream, dup2 would do nothing, and exec would close the
-// stream.
+// streams. If the descriptor had the number of a stream, dup2 would do nothing, and exec would
+// close the stream.
 int OpenNull() {
   const int first = open("/dev/null", O_RDWR | O_CLOEXEC);
   if (first < 0) return first;

@@ -17,17 +17,17 @@ struct RunLimits {
   // waits forever on a kernel whose integrity value never settles.
   int milliseconds = 120000;
   // The limit of the memory that the program can write to (RLIMIT_DATA); 0: this process's limit.
-  // The tool needs up to 16 bytes for each byte of the file and of its entries' contents, and
-  // aborts if it cannot get them. RLIMIT_AS is not used, because allocators of newer releases
-  // reserve far more addresses than they use.
+  // The tool needs up to 16 bytes for each byte of the file and of its entries' contents, and up to
+  // 2 KiB for each byte of AndroidManifest.xml. It aborts if it cannot get this memory. RLIMIT_AS
+  // is not used, because allocators of newer releases reserve far more addresses than they use.
   size_t memory_bytes = APKTOOLKIT_MEMORY_LIMIT;
 };
 
 enum class RunEnd {
   kExited,      // with the status `value`
-  kKilled,      // by the signal `value`; without memory the tool ends by SIGABRT
+  kKilled,      // by the signal `value`; if memory runs out, the tool aborts (SIGABRT)
   kTimedOut,    // and then killed
-  kNotStarted,  // `value` is the errno, or 0 if the child could not exec the program
+  kNotStarted,  // `value` is the errno, or 0 if the child could not start the program
   kLost,        // another thread of this process waited for the child
 };
 
@@ -38,6 +38,7 @@ struct RunResult {
 
 // Runs `command`, a program's path and its arguments. Waits until the program ends, and kills it at
 // the time limit. The program gets /dev/null for its three standard streams, and no other
-// descriptor of this process. No signal is blocked in it. It keeps this process's environment and
-// working directory. The caller must not hold a lock during the call, and must not ignore SIGCHLD.
+// descriptor of this process. No signal is blocked in the program. The program keeps this process's
+// environment and working directory. The caller must not hold a lock during the call, and must not
+// ignore SIGCHLD.
 RunResult RunProgram(const std::vector<std::string>& command, const RunLimits& limits);

@@ -5,7 +5,7 @@
 // are beside it. It must be called before any code of the package is run, mapped, or compiled ahead
 // of time (dexopt). From the call on, nobody may write to the package or beside it. The caller must
 // not hold a lock: the call may take as long as the limits allow. After an update of the system,
-// which may bring another key, call it for every installed package (main.cpp).
+// which may bring another key, SignPackage must be called for every installed package (main.cpp).
 #pragma once
 
 #include <string>
@@ -19,20 +19,20 @@ struct InstalledPackage {
 };
 
 enum class SignOutcome {
-  kTrustedAlready,  // nothing was run
+  kTrustedAlready,  // apktoolkit was not run
   kTrusted,
-  kOtherSigner,  // the package manager does not know the JAR signer; nothing was run
-  kNoJarSigner,  // the package has no good JAR signature; nothing was run
-  kNotTrusted,   // the tool ran, and the kernel does not trust the package: the tool's log says why
-  kTimedOut,     // the tool was killed at its limit
-  kOutOfMemory,  // the tool ended at its memory limit
-  kCannotBeRun,  // a program of the kit is missing, or this process may not start it
+  kOtherSigner,  // the package manager does not know the JAR signer; apktoolkit was not run
+  kNoJarSigner,  // the package has no good JAR signature; apktoolkit was not run
+  kNotTrusted,   // any other reason; if apktoolkit ran, its log has the reason
+  kTimedOut,     // apktoolkit or apktoolkit-bound was killed at the time limit
+  kOutOfMemory,  // apktoolkit or apktoolkit-bound aborted, as it does at the memory limit
+  kCannotBeRun,  // apktoolkit or apktoolkit-bound is missing or cannot be started
 };
 
 // Runs the programs apktoolkit-verify, apktoolkit-bound and apktoolkit in `directory`
 // ("/system/bin").
 //
-// The product decides how to react. It should treat an untrusted package like any other without a
+// The product decides how to react. It should treat an untrusted package like a package without a
 // payload. After kTimedOut and kOutOfMemory the libraries may be signed. The package itself is not,
 // because it is signed last. Do not try again at once: the same file takes the same time.
 SignOutcome SignPackage(const std::string& directory, const InstalledPackage& package,

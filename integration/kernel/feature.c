@@ -51,7 +51,7 @@ MODULE_PARM_DESC(verify_errno, "errno for a file that is not trusted");
 
 /* ---- The two commands. Functions return 0 or a negative error number. */
 
-/* False for a descriptor that only names a file (O_PATH). */
+/* False if there is no file, or if the descriptor only names a file (O_PATH). */
 static bool is_open(const struct file *file)
 {
 	return file && !(file->f_mode & FMODE_PATH);
@@ -64,7 +64,8 @@ struct signature {
 	u8 data[];
 } __packed;
 
-/* The caller frees the result. Each byte is read only once, because the task may change it. */
+/* Returns a signature without its digest, which the caller must free, or an error pointer. Each
+ * byte is read only once, because the task may change it. */
 static struct signature *copy_payload(const u8 __user *payload)
 {
 	struct signature *signature;
@@ -82,7 +83,7 @@ static struct signature *copy_payload(const u8 __user *payload)
 	return ERR_PTR(-EFAULT);
 }
 
-/* A product must fix the file's bytes. Here they may change after the digest is computed. */
+/* A product must prevent later changes of the file. Here its bytes may still change. */
 static int digest_file(struct file *file, u8 digest[SHA256_DIGEST_SIZE])
 {
 	struct sha256_state state;
@@ -246,7 +247,7 @@ static const struct file_operations value_operations = {
 	.release = value_release,
 };
 
-/* The caller must pass the inode on, or release it. */
+/* Returns a new inode, which the caller must pass on or release, or an error pointer. */
 static struct inode *new_node(struct inode *directory, umode_t mode)
 {
 	struct inode *inode = new_inode(directory->i_sb);
@@ -283,7 +284,7 @@ static struct dentry *look_up_integrity(struct inode *directory, struct dentry *
 		inode->i_op = &directory_operations;
 		inode->i_fop = &simple_dir_operations;
 	}
-	return d_splice_alias(inode, dentry); /* or the inode's error */
+	return d_splice_alias(inode, dentry); /* returns the error if inode is an error pointer */
 }
 
 /* ---- The handlers of the two probes. They redirect a kernel function to a function above. */

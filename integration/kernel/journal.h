@@ -11,7 +11,7 @@ struct file;
 int journal_open(void);
 
 /* file: the file that is open as fd, or NULL. payload: `size` bytes, which begin with the payload's
- * length; none if the payload could not be read. error: 0 or a negative error number. */
+ * length; `size` is 0 if the payload was not read. error: 0 or a negative error number. */
 void journal_sign(int fd, struct file *file, const void *payload, size_t size, int error);
 void journal_verify(int fd, struct file *file, int error);
 

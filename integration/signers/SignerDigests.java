@@ -15,9 +15,8 @@ import java.util.LinkedHashSet;
 import java.util.Set;
 
 /**
- * The package manager's side of binding the signers. It names each signer of a package by the same
- * digest that apktoolkit passes to the kernel. Use this class in the process that installs
- * packages.
+ * Names each signer of a package, as the package manager knows it, by the same digest that
+ * apktoolkit passes to the kernel. Use this class in the process that installs packages.
  *
  * <p>The package manager uses the newest signing block that it knows. apktoolkit uses the JAR
  * signature. Pass a package to apktoolkit only if its JAR signer is one of the package manager's
@@ -27,17 +26,17 @@ public final class SignerDigests {
     private SignerDigests() {}
 
     /**
-     * Returns the digests of the present signers of an installed package, from API level 28 on
-     * ({@code PackageManager.GET_SIGNING_CERTIFICATES}). If the key was rotated, earlier keys are
-     * left out on purpose. Somebody else may have a retired key, and a payload names only the key,
-     * not the package.
+     * Returns the digests of the current signers of an installed package. Needs API level 28 or
+     * later ({@code PackageManager.GET_SIGNING_CERTIFICATES}). If the key was rotated, earlier keys
+     * are left out on purpose. Somebody else may have a retired key, and a payload names only the
+     * key, not the package.
      */
     public static String of(SigningInfo info) throws CertificateException {
         return of(info.getApkContentsSigners());
     }
 
     /**
-     * The same for API level 27 ({@code PackageInfo.signatures}, {@code PackageManager.GET_SIGNATURES}).
+     * Does the same for API level 27 ({@code PackageInfo.signatures}, {@code PackageManager.GET_SIGNATURES}).
      *
      * @return the SHA-256 digest of each signer's RSA modulus, in lower-case hexadecimal, separated
      *     by commas. Other kinds of key are left out, because apktoolkit does not accept their
@@ -62,7 +61,7 @@ public final class SignerDigests {
         return !jarSigner.isEmpty() && Arrays.asList(digests.split(",")).contains(jarSigner);
     }
 
-    /** The digest of a payload: over the modulus's bytes, highest first, without leading zeros. */
+    /** Returns the SHA-256 digest of the modulus's bytes, high byte first, without leading zeros. */
     private static String digestOf(BigInteger modulus) {
         byte[] bytes = modulus.toByteArray();
         int sign = bytes[0] == 0 ? 1 : 0;

@@ -386,7 +386,7 @@ Bytes Replaced(Bytes document, const Bytes& old_bytes, const Bytes& new_bytes) {
   return document;
 }
 
-// For such a name, the platform's library returns a length but no text.
+// For a name that does not end, the platform's library returns a length but no text.
 TEST(AndroidManifestDocument, AnElementWhoseNameDoesNotEndIsPassedOver) {
   CompiledXml xml;
   xml.Element("manifest", {Package("a")}).Element("permission", {AndroidName(kPermission)});

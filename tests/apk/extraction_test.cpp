@@ -1,4 +1,5 @@
-// Tests the checks of an entry's lengths before memory is allocated for the entry.
+// Tests the extraction of entries, and the checks of an entry's lengths before memory is allocated
+// for the entry.
 #include "apk/extraction.h"
 
 #include <gtest/gtest.h>
@@ -83,7 +84,8 @@ TEST(Extraction, AStoredEntryIsAsLongAsItsData) {
   EXPECT_TRUE(IsPlausibleLength(entry));
 }
 
-// An entry of zeros longer than the trusted length. It is made once, because that takes time.
+// An entry of zeros longer than the trusted length. It is made once, because the compression takes
+// time.
 constexpr uint32_t kLongLength = kZipTrustedLength + 2;
 const ZipItem& LongItem() {
   static const ZipItem item = [] {

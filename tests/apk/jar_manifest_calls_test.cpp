@@ -1,6 +1,6 @@
-// Counts the comparisons of the readers of a JAR manifest, and changes the direction of their
-// copies, because results show neither. The linker redirects the calls of the whole program to the
-// functions below.
+// Counts the comparisons that the readers of a JAR manifest make, and changes the direction in
+// which they copy. The results of the readers show neither. The linker redirects the calls of the
+// whole program to the functions below.
 #include <gtest/gtest.h>
 
 #include <algorithm>
@@ -130,9 +130,9 @@ size_t ComparisonsOfFinding(const std::vector<std::string>& names) {
   return comparisons;
 }
 
-// Comparing two entry names also compares a few attribute names. If the names are in order, the
-// name is compared with about log2(4096) others. If not, it is compared only with the one of the
-// same hash.
+// Each comparison of two entry names also compares a few attribute names. If the entry names are in
+// order, the wanted name is compared with about log2(4096) of them. Otherwise, the wanted name is
+// compared only with the entry name of the same hash.
 TEST_F(JarManifestCalls, NamesInOrderAreNotHashed) {
   std::vector<std::string> names = ShortNames(4096);
   const size_t in_order = ComparisonsOfFinding(names);

@@ -108,7 +108,7 @@ TEST(ManifestMf, NothingOfAnEarlierTextSurvives) {
   }
 }
 
-// The memory after the text contains bytes that would change the result.
+// The memory after the text contains bytes that would change the result if they were read.
 TEST(ManifestMf, NothingBehindTheTextIsRead) {
   LogCapture log;
   const std::string whole = "Name: abcdefghijklm\r\n nopq\r\nKey: 1\r\n\r\nB:\r\n\r\n";
@@ -392,7 +392,7 @@ TEST(ManifestMf, NulAtTheEndOfTheTextEndsAValueOnly) {
   ExpectNoColon(Text("A: 1\r\n\r\n\0"), "", {{{"A", "1"}}});
 }
 
-// The parser ends on every prefix, and finds no more sections than in the whole text.
+// The parser ends on every prefix, and finds only the first sections of the whole text.
 TEST(ManifestMf, EveryPrefixOfAManifestEnds) {
   LogCapture log;
   const std::string text = "A: 1\r\n 2\r\n\r\nB:\nC: 3\n\nD:\r\n v\r\r";

@@ -7,7 +7,7 @@
 
 namespace {
 
-// Only the large integers are allocated with malloc.
+// In the tool's code, only the large integers are allocated with malloc.
 TEST(VerifyCertificate, AKeyThatFindsNoMemoryIsReportedWithItsCode) {
   const Bytes archive = MakePackage().Build();
   LogCapture log;
@@ -19,8 +19,8 @@ TEST(VerifyCertificate, AKeyThatFindsNoMemoryIsReportedWithItsCode) {
                                     Error("file not verified: META-INF/CERT.SF\n")}));
 }
 
-// Each later failed allocation stops a verification: first that of the certificate, and then that
-// of the data.
+// If a later allocation fails, the verification of the certificate fails. If a still later one
+// fails, the verification of the data fails.
 TEST(VerifyCertificate, AVerificationThatFindsNoMemoryIsReportedWithItsCode) {
   const Bytes archive = MakePackage().Build();
   int certificates = 0, signatures = 0;

@@ -114,8 +114,9 @@ TEST(InitCertSf, BlocksOfOtherKindsAreNotLookedFor) {
   }
 }
 
-// The zip library has its own order of entries, so the test reads the first entry from it.
-TEST(InitCertSf, OfTwoSignersTheFirstInTheArchivesOrderDecides) {
+// The zip library has its own order of entries, so the test asks the library for the first
+// signature file.
+TEST(InitCertSf, OfTwoSignersTheFirstInTheZipLibrarysOrderDecides) {
   PackageOptions options;
   options.base_name = "META-INF/OTHER";
   Package package = MakePackage(options);

@@ -91,8 +91,8 @@ TEST(VerifyCertificate, ASignatureOverOtherBytesFails) {
                      Error(kNotVerified)}));
 }
 
-// The bytes that are read as the signature are an AlgorithmIdentifier and the element after it.
-// They have no valid padding, even if the real signature is good.
+// The bytes that are read as the signature start with the contents of the
+// digestEncryptionAlgorithm. They have no valid padding, even if the real signature is good.
 TEST(VerifyCertificate, AuthenticatedAttributesFail) {
   SignatureBlock block;
   block.authenticated_attributes = true;
@@ -198,7 +198,7 @@ TEST(VerifyCertificate, AShorterSignatureStringAtTheBlocksEndFails) {
             Records({Error("RSA could not verify data: 5\n"), Error(kNotVerified)}));
 }
 
-// The result of VerifyCertificate itself, for the block over this signature file.
+// The result of VerifyCertificate for a block that signs `covered`, with the digests of `claimed`.
 struct Verification {
   bool verified;
   Bytes key;

@@ -355,7 +355,7 @@ TEST(Asn1GetOid, EmptyOidIsRefused) {
 }
 
 TEST(Asn1GetOid, OtherElementsAreRefused) {
-  // Another tag, another class, a header that cannot be read.
+  // Another tag, another class, an element that ends beyond the bytes, no bytes.
   for (const char* digits : {"05 01 2a", "86 01 2a", "06 02 2a", ""}) {
     const Bytes bytes = FromHex(digits);
     asn1_oid oid;

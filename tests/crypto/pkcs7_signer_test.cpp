@@ -95,8 +95,8 @@ TEST(ProcessCertSigner, SignersAndTheirFirstMayEndWithTheBlock) {
 
 TEST(ProcessCertSigner, VersionAndIssuerMayEndWithTheBlock) {
   // The SignerInfo is empty. The version and the issuer are read from the bytes after it, and the
-  // digestAlgorithm is missing. First the issuer ends with the block. Then the version or the
-  // issuer is one byte longer.
+  // digestAlgorithm is missing. In the first and the third case, the issuer ends with the block. In
+  // the second case the version is one byte longer, and in the fourth the issuer.
   const std::pair<const char*, const char*> cases[] = {
       {"31 00 30 00 02 03 01 02 03 30 00", kNoAlgorithm},
       {"31 00 30 00 02 04 01 02 03 30 00", kUnreadable},

@@ -271,8 +271,8 @@ TEST(ProcessCertKey, ModulusLosesExactlyOneZero) {
   EXPECT_EQ(Field(processed.record.modulus, processed.record.modulus_length), rest);
 }
 
-// In the first case, the modulus is empty and a zero byte follows it. In the second case it is one
-// zero byte, and in the third case two zero bytes.
+// In the first case, the modulus is empty and a zero byte follows it. In the second case the
+// modulus is one zero byte, and in the third case two zero bytes.
 TEST(ProcessCertKey, EmptyModulusLeavesNoRoomForTheExponent) {
   const std::pair<const char*, uint32_t> cases[] = {
       {"30 03 02 00 00", 0}, {"30 06 02 01 00 02 01 03", 0}, {"30 07 02 02 00 00 02 01 03", 1}};

@@ -1,5 +1,5 @@
-// Tests rsa_pkcs1_verify with signatures from libcrypto. Also with blocks made by hand, to which
-// only the private-key operation was applied.
+// Tests rsa_pkcs1_verify with signatures from libcrypto, and with blocks made by hand, to which the
+// test applies only the private-key operation.
 #include "crypto/rsa.h"
 
 #include <gtest/gtest.h>

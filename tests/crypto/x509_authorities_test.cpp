@@ -90,7 +90,7 @@ bool HasExtension(const std::vector<std::string>& lines, const std::string& titl
   });
 }
 
-// Each attribute kept, as "TYPE VALUE-IN-HEX".
+// Each kept attribute as "TYPE VALUE-IN-HEX".
 std::vector<std::string> NameLines(const x509_name& name) {
   std::vector<std::string> lines;
   for (size_t i = 0; i < name.attribute_count; ++i) {
@@ -200,6 +200,6 @@ TEST(X509Authorities, EveryCertificateReadsAsOpensslReadsIt) {
     ExpectAsOpensslReads(parsed.cert, lines);
     extensions_seen |= parsed.cert.extensions_present;
   }
-  // Makes sure that every comparison had something to compare.
+  // Makes sure that the comparisons of key usages and basic constraints had values to compare.
   EXPECT_EQ(extensions_seen & 7u, kX509BasicConstraints | kX509PathLenConstraint | kX509KeyUsage);
 }

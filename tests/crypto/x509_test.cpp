@@ -28,7 +28,7 @@ Certificate Full() {
   return certificate;
 }
 
-// True if a field of the record is empty or lies in `bytes`.
+// True if a field of the record is empty, or is inside `bytes`.
 bool Inside(const GuardedBytes& bytes, const uint8_t* value, uint64_t length) {
   if (value == nullptr) return length == 0;
   const uint8_t* end = bytes.data() + bytes.size();
@@ -314,7 +314,7 @@ TEST(X509PublicKey, MalformedKeyInfoIsMinus14) {
       der::Sequence({algorithm}),                                         // no key
       der::Sequence({algorithm, der::OctetString({1})}),                  // another element
       der::Sequence({algorithm, der::ContextPrimitive(3, {1})}),          // another class
-      der::Sequence({algorithm, der::Element(der::kBitString, Bytes())})  // not even unused bits
+      der::Sequence({algorithm, der::Element(der::kBitString, Bytes())})  // no contents
   };
   for (const Bytes& info : cases) {
     Certificate certificate = Unsigned();

@@ -16,7 +16,7 @@
 
 namespace {
 
-// A shell that runs `script`. Its output goes to the file $0.
+// A shell that runs `script`. Its output goes to `file`, which is $0 in the script.
 RunResult Shell(const std::string& script, const std::string& file = "/dev/null",
                 const RunLimits& limits = {}) {
   return RunProgram({"/bin/sh", "-c", "exec >\"$0\"; " + script, file}, limits);

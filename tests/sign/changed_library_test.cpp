@@ -280,7 +280,8 @@ TEST_F(ChangedLibrary, WrittenToAfterItsThirdDigestIsRefused) {
   ExpectRefused(3);
 }
 
-// --- Under a lease. An open breaks the lease, and the tool waits for its holder.
+// --- Under a lease. The tool's open breaks the lease, and the tool waits until the holder gives
+// the lease up.
 
 TEST_F(ChangedLibrary, ThatIsLeasedAtItsSecondOpeningIsSigned) {
   int asked = 0;
@@ -288,7 +289,7 @@ TEST_F(ChangedLibrary, ThatIsLeasedAtItsSecondOpeningIsSigned) {
     return path == target_ && ++asked == 2 ? EWOULDBLOCK : 0;
   };
   ExpectSigned(1);
-  EXPECT_EQ(asked, 3);  // the third pins the file; its link in /proc is then opened
+  EXPECT_EQ(asked, 3);  // the third pins the file (O_PATH); a fourth opens its link in /proc
 }
 
 // Before the tool opens the file again, the holder of the lease could put another file in its

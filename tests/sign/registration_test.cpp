@@ -89,7 +89,7 @@ TEST(ZuSign, TheRegistrationIsMadeForTheSecondDescriptor) {
 }
 
 TEST(ZuSign, APackageWithThePermissionThatTurnedBadIsNotRegistered) {
-  // The permission is known only if the manifest verified, so only the dex file is bad.
+  // The permission is read only if META-INF/MANIFEST.MF verified, so only the dex file is bad.
   Package package = SecureStoragePackage();
   package.Tamper("classes.dex");
   ArchiveOnPhone file(package);

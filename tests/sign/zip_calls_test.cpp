@@ -1,5 +1,6 @@
-// Tests the calls of the zip library that results do not show. The linker redirects the tool's
-// calls to the functions below (CMakeLists.txt has the mangled names), which call the library.
+// Tests those calls of the zip library that the tool's results do not show. The linker redirects
+// the tool's calls to the functions below, which then call the library. CMakeLists.txt has the
+// mangled names.
 #include <gtest/gtest.h>
 
 #include <algorithm>

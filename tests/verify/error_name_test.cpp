@@ -5,7 +5,7 @@
 #include <climits>
 #include <cstring>
 
-// The C library names every number up to the highest that a system call can return.
+// Compares all numbers up to 4095, the highest that a system call can return.
 TEST(ErrorName, IsTheNameThatTheCLibraryHas) {
   constexpr int kLast = 4095;
   int named = 0;
