@@ -25,7 +25,8 @@ struct Answers {
   Judgement judgement;
 };
 
-// The two run at the same time, because neither uses the other's answer.
+// The tool and the installer's verifier run at the same time, because neither needs the other's
+// answer.
 Answers Ask(const ListedFile& file, Simulator* simulator, Installer* installer) {
   const FileWatch watch(file.name);
   const bool is_run = file.state == ListedFile::State::kToRun;

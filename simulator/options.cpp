@@ -321,7 +321,8 @@ void AddRun(CLI::App* app, Options* options, std::string* runner) {
       ->take_last();
 }
 
-// With --verify nothing is signed. Options for verdicts have no meaning then.
+// With --verify, nothing is signed and there are no verdicts. The options below have no meaning
+// then.
 void AddVerify(CLI::App* app, Options* options) {
   CLI::Option* const verify = app->add_flag("--verify", options->verify,
                                             "Sign nothing. Run the apktoolkit-verify beside\n"

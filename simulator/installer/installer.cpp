@@ -141,7 +141,7 @@ bool Send(int fd, std::string_view bytes) {
 }
 
 // Receives one line, without its line feed. Returns false if the line does not end before the
-// deadline.
+// deadline, is longer than kLongest, or is cut off by the end of the program.
 bool Receive(int fd, const Deadline& deadline, std::string* line) {
   constexpr int kNowAndThen = 100;  // milliseconds
   constexpr size_t kLongest = 64 << 20;

@@ -39,7 +39,8 @@ class Installer {
   std::optional<std::string> Missing() const;
 
   // Asks the phones' installer about the file. The result is kNotAsked for a file that is not a
-  // package. Several threads may call it; the packages are judged one after the other.
+  // package, and for every file with kOff. Several threads may call it; the packages are judged one
+  // after the other.
   Judgement Judge(const std::string& file);
 
  private:

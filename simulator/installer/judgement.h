@@ -47,7 +47,7 @@ struct Judgement {
   enum class State {
     kNotAsked,  // nobody asked, or the file is not a package
     kMissing,   // the verifier is not installed
-    kGaveUp,    // the verifier crashed on the file, or gave no valid answer
+    kGaveUp,    // the verifier gave no valid answer, or none in time
     kJudged,
   };
 

@@ -14,12 +14,13 @@ struct AndroidManifest {
   // The strings of the document overlap. The platform's parser would use many times the size of
   // the document, so the document is not read.
   bool has_overlaps = false;
-  // The package's name as the tool's own code reads it; none if it cannot read the document.
+  // The package's name as the tool's own code reads it; none if the document cannot be read.
   std::optional<std::string> package_name;
   // The package's name by the installer's rules: the root's attribute "package" without a
   // namespace. UTF-8, up to the first NUL.
   std::string installer_name;
-  // The attribute extractNativeLibs of the first application; none if it has no such attribute.
+  // The attribute extractNativeLibs of the first application; none if there is no such attribute
+  // with a boolean or integer value.
   std::optional<bool> extracts_libraries;
 };
 

@@ -1,7 +1,6 @@
-// The entries of a zip archive. They are read with the platform's own zip library and with the
-// tool's code, so they are the entries that the tool sees, in the same order. The file is not
-// trusted, so each reading has a limit. Log messages of the library and of the tool's code are
-// dropped here.
+// The entries of a zip archive. They are read with the platform's own zip library and the tool's
+// code, as in the tool. The file is not trusted, so Read() and ReadToCompare() refuse entries that
+// are too long. Log messages of the library and of the tool's code are dropped in this process.
 //
 // The library maps a part of the file into memory. If the file becomes shorter while an Archive
 // exists, the missing part reads as zeros, and HasShrunk() returns true.
@@ -74,8 +73,8 @@ class Archive {
   ReadResult ReadToCompare(const std::string& name, std::vector<uint8_t>* content) const;
   // The names of the entries that Read() has refused so far, because they are too long.
   const std::vector<std::string>& too_long() const { return too_long_; }
-  // Passes the entry to `take`, part by part, until `take` returns false. Returns false if it did
-  // not reach the entry's end.
+  // Passes the entry to `take`, part by part, until `take` returns false. Returns false if the
+  // entry was not passed to its end.
   bool Stream(const std::string& name,
               const std::function<bool(std::string_view part)>& take) const;
 

@@ -1,6 +1,6 @@
 // The central directory of a zip archive and the end record after it (APPNOTE.TXT 4.3.12 and
 // 4.3.16). The platform's library skips a damaged entry and does not report its name. This reader
-// has the names of all entries.
+// also returns damaged entries.
 #pragma once
 
 #include <cstdint>
@@ -12,7 +12,7 @@ namespace simulator {
 
 struct ArchiveEnd {
   uint16_t entry_count;
-  // The offset of the central directory, as the record states it. May be beyond the end of the
+  // The offset of the central directory, as the record states it. It may be beyond the end of the
   // file.
   uint32_t directory_offset;
 };

@@ -122,7 +122,7 @@ PublicKey ReadKey(X509* certificate) {
   return key;
 }
 
-// The library compares both forms of time, UTCTime and GeneralizedTime.
+// Uses the library's comparison, which accepts both UTCTime and GeneralizedTime.
 std::optional<int64_t> SecondsOf(const ASN1_TIME* time) {
   constexpr int64_t kSecondsOfDay = 86'400;
   const bssl::UniquePtr<ASN1_TIME> start(ASN1_TIME_set(nullptr, 0));
@@ -151,9 +151,9 @@ std::string NameText(const X509_NAME* name) {
   return text;
 }
 
-// The library could print the whole name, but its keywords differ from the JDK's, for which people
-// search. The library prints only the value: in quotation marks if it has special characters, and
-// as hexadecimal digits if it is not a text.
+// The library could print the whole name, but its keywords differ from those of the JDK, which
+// people search for. Here the library prints only the value: in quotation marks if it has special
+// characters, and as hexadecimal digits if it is not a text.
 std::string AttributeText(const X509_NAME_ENTRY* attribute) {
   constexpr unsigned long kFlags = ASN1_STRFLGS_ESC_2253 | ASN1_STRFLGS_ESC_QUOTE |
                                    ASN1_STRFLGS_UTF8_CONVERT | ASN1_STRFLGS_DUMP_UNKNOWN |
@@ -180,7 +180,7 @@ std::string KeyKind(const ASN1_OBJECT* algorithm) {
   return facts.nid == NID_dsa ? "DSA" : facts.name;
 }
 
-// Has the form of keytool's -sigalg, such as "SHA256withRSA".
+// The result has the form of keytool's -sigalg, such as "SHA256withRSA", if the algorithm is known.
 std::string SignatureName(const ASN1_OBJECT* algorithm) {
   int digest = NID_undef;
   int key = NID_undef;

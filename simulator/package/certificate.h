@@ -1,5 +1,5 @@
-// The facts of certificates, in the forms that people compare: those that `apksigner verify
-// --print-certs` prints. The platform's crypto library reads the certificates. Nothing is verified.
+// The facts of certificates, in forms that people can compare with the output of `apksigner verify
+// --print-certs`. The platform's crypto library reads the certificates. Nothing is verified.
 #pragma once
 
 #include <openssl/sha.h>

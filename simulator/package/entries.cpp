@@ -67,15 +67,15 @@ EntryDigest Compare(Archive* archive, const EntryDigests& manifest, const Archiv
   return IsKnownDigest(digest_name, tool) ? EntryDigest::kDiffers : EntryDigest::kNotCompared;
 }
 
-// True if the tool accepts the SHA-1 digest of no bytes under this name.
+// True if the tool accepts the SHA-1 digest of an empty text under this name.
 bool IsSha1Digest(const std::string& name, Apk* tool) {
   std::vector<uint8_t> sha1;
   ComputeSHA1Digest({}, sha1);
   return tool->VerifyData(name, sha1, {});
 }
 
-// True if the tool reads digests with this name. It then accepts the SHA-1 or the SHA-256 digest of
-// no bytes.
+// True if the tool supports digests with this name: it then accepts the SHA-1 or the SHA-256 digest
+// of an empty text.
 bool IsKnownDigest(const std::string& name, Apk* tool) {
   std::vector<uint8_t> sha256;
   ComputeSHA256Digest({}, sha256);

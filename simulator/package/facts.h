@@ -17,7 +17,7 @@
 namespace simulator {
 
 enum class FileKind {
-  kUnreadable,  // it cannot be opened; `error` says why
+  kUnreadable,  // it cannot be opened; see `error`
   kDirectory,
   kSpecial,  // a device, a pipe or a socket
   kEmpty,
@@ -36,8 +36,8 @@ struct NewerSignerFacts {
 // A library lib/….so of the package, and the file at the place where the tool looks for it.
 struct LibraryFacts {
   std::string entry;  // its name in the package
-  // The installer's place for it, relative to the package's directory; empty: no phone of this kind
-  // installs it.
+  // The installer's place for it, relative to the package's directory; empty: its name does not
+  // begin with the directory of an Arm ABI.
   std::string place;
   bool is_met = true;          // true if the tool's walk over the libraries reaches it
   int error = 0;               // errno of opening the file as the tool does; 0: it can be opened
@@ -52,11 +52,11 @@ struct PackageFacts {
   uint64_t size = 0;          // of the file, in bytes
   std::string sha256;         // of the file's bytes; empty: it was not read to its end
   uint64_t packages = 0;      // for a directory: the number of files in it with package names
-  // The result of the zip library; if it is 0, the file is an archive, and the members below are
-  // filled.
+  // The result of the zip library. If it is 0, the library opened the archive, and the members
+  // after `entry_twice` are filled.
   int32_t archive_result = -1;
 
-  std::string entry_twice;  // the first name that the archive has twice; empty: none
+  std::string entry_twice;  // the first name that a refused archive has twice; empty: none
 
   AndroidManifest manifest;
   JarSignatureFacts jar;

@@ -30,8 +30,8 @@ struct JarSignatureFacts {
   // The entries META-INF/*.SF, in the tool's order. The tool uses the first one.
   std::vector<std::string> signature_files;
   std::string claimed_schemes;        // X-Android-APK-Signed, such as "2, 3"; empty: not stated
-  bool has_manifest_digest = false;   // the signature file states one, of any kind
-  bool has_sha1_of_manifest = false;  // the one that the tool uses is a SHA-1 digest
+  bool has_manifest_digest = false;   // the signature file has a digest of the manifest
+  bool has_sha1_of_manifest = false;  // that digest, as the tool uses it, is SHA-1
   // The name of the block that the tool looks for (.RSA). If the package has only a block for
   // another kind of key (.EC or .DSA), the name of that block.
   std::string block_name;
@@ -40,7 +40,8 @@ struct JarSignatureFacts {
   std::optional<ToolKey> key;
 
   SignatureBlockFacts block;  // as a strict reader finds it; its certificate is not kept
-  // The first certificate; none if the tool reads its key from another certificate.
+  // The first certificate; none if it cannot be parsed, or if the tool reads its key from another
+  // certificate.
   std::optional<CertificateFacts> certificate;
   bool names_other_certificate = false;  // the first signer's identifier names another certificate
 };

@@ -15,7 +15,7 @@ constexpr size_t kFooter = kSizeField + kMagic.size();
 // A block with more signers counts as damaged here. Phones accept at most ten.
 constexpr size_t kMostSigners = 16;
 
-// The known schemes. `id` is the number of the scheme's pair in the block.
+// The known schemes. `id` identifies the scheme's pair in the block.
 constexpr struct {
   uint32_t id;
   const char* name;

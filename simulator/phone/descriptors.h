@@ -1,4 +1,5 @@
-// Descriptors for the stand-ins. The tool's own descriptors must be the same as without them.
+// Descriptors for the stand-ins. The tool's own files must get the same descriptors as without the
+// stand-ins.
 #pragma once
 
 #include <string>
@@ -6,8 +7,9 @@
 namespace simulator {
 
 // Moves the open file `fd` to a high descriptor, close-on-exec: in the upper quarter of the
-// process's range, or above 767 in a large one. The system hands out the lowest free descriptors,
-// so the tool still gets the same ones. Returns the new descriptor, or `fd` itself if none is free.
+// process's range, or from 768 on if the range has more than 1024 descriptors. The system hands out
+// the lowest free descriptor, so the tool still gets the same descriptors. Returns the new
+// descriptor, or `fd` itself if it could not be moved.
 int MoveHigh(int fd);
 
 // The path of the open file `fd`, as the kernel knows it; empty if `fd` is not open. Does not

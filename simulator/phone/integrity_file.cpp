@@ -1,5 +1,5 @@
 // The files in which the kernel publishes each task's integrity value: /proc/self/integrity/value
-// and /proc/PID/integrity/value, for callers that open them through the C library. The files are
+// and /proc/PID/integrity/value, for callers that open them with fopen or fopen64. The files are
 // read-only. Each opening, of any task's file, delivers the next of the phone's integrity values.
 #include <fcntl.h>
 #include <sys/mman.h>
@@ -88,7 +88,7 @@ bool TaskExists(int pid) {
   return pid == 0 || access(("/proc/" + std::to_string(pid)).c_str(), F_OK) == 0;
 }
 
-// Makes a new file that contains `text` and cannot be written any more. Returns its descriptor, or
+// Makes a new file that contains `text` and is sealed against writing. Returns its descriptor, or
 // -1.
 int FileHolding(const std::string& text, bool closes_on_exec) {
   const int fd = memfd_create("integrity", MFD_ALLOW_SEALING | (closes_on_exec ? MFD_CLOEXEC : 0U));

@@ -1,4 +1,4 @@
-// The journal of a simulated run: one JSON object a line, in the order of the events
+// The journal of a simulated run: one JSON object per line, in the order of the events
 // (docs/journal.md describes it). Both the stand-ins inside the tool and apktoolkit-sim outside it
 // write to the journal. Each line is one appending write, so the lines are in the order of the
 // writes. This code needs no JSON library, because the stand-ins must not bring libraries into the
@@ -22,7 +22,7 @@ class Event {
   explicit Event(const char* name) : line_("{\"event\":" + EncodeText(name)) {}
 
   Event& Number(const char* key, int64_t value) { return Json(key, std::to_string(value)); }
-  // A text is any bytes (see EncodeText).
+  // A text may contain any bytes (see EncodeText).
   Event& Text(const char* key, std::string_view bytes) { return Json(key, EncodeText(bytes)); }
   // As lower-case hexadecimal digits.
   Event& Hex(const char* key, std::string_view bytes) {

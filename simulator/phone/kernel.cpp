@@ -1,8 +1,8 @@
 // The kernel's integrity feature: its two commands, under both names of fcntl in the C library.
 //
 // This file, integrity_file.cpp, log.cpp and standard_output.cpp are one library, which is loaded
-// before all others. It replaces the functions by which the tool uses the phone. Calls that do not
-// concern the phone are passed, unchanged, to the next function with that name.
+// before all others. It replaces the functions by which the tool uses the phone's kernel and log.
+// Calls that do not concern the phone are passed, unchanged, to the next function with that name.
 #include <fcntl.h>
 #include <sys/mman.h>
 #include <sys/stat.h>
@@ -110,8 +110,8 @@ int CopyPayload(const void* argument, std::string* payload) {
 }
 
 // Copies from the process's memory as the kernel does: if the memory cannot be read, returns false,
-// and no signal is sent. The real kernel makes the copy, by way of a file. This works under an
-// emulator, too.
+// and no signal is sent. Copies through a file, because pwrite fails for unreadable memory. This
+// also works under an emulator.
 bool CopyIn(const char* from, size_t size, char* to) {
   const ssize_t wanted = static_cast<ssize_t>(size);
   return pwrite(Scratch(), from, size, 0) == wanted && pread(Scratch(), to, size, 0) == wanted;

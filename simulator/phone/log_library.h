@@ -2,8 +2,8 @@
 //
 // Two generations of the library are in use. Up to API level 29 a record is an
 // `__android_logger_data`, and the text is passed beside it. Later it is an `__android_log_message`
-// with the text inside. Only this file sees the difference. Texts and records belong to the caller,
-// and are read only during the call.
+// with the text inside. ReadLogRecord hides this difference. Texts and records belong to the
+// caller, and are read only during the call.
 #pragma once
 
 #include <android/log.h>

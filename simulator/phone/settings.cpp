@@ -59,7 +59,7 @@ int Number(const char* name, int otherwise) {
   return text == nullptr ? otherwise : static_cast<int>(strtol(text, nullptr, 10));
 }
 
-// If the text is not DEVICE:INODE, the result has inode 0, which no file has.
+// If the text has no inode number, the result has inode 0, which no file has.
 FileId ParseFileId(const std::string& text) {
   const size_t colon = text.find(':');
   if (colon == std::string::npos) return {0, 0};

@@ -1,7 +1,7 @@
-// The settings of the simulated phone. They travel from apktoolkit-sim to the stand-ins in
-// environment variables, one per setting, all with the prefix APKTOOLKIT_SIM_. A setting without a
-// variable has the value of a healthy phone. Both apktoolkit-sim and the stand-ins use this file,
-// so that names and formats are defined in one place.
+// The settings of the simulated phone. apktoolkit-sim passes them to the stand-ins in environment
+// variables, one per setting, all with the prefix APKTOOLKIT_SIM_. A setting without a variable has
+// the value of a healthy phone. Both apktoolkit-sim and the stand-ins use this file, so that names
+// and formats are defined in one place.
 #pragma once
 
 #include <sys/types.h>
@@ -26,8 +26,8 @@ inline bool operator==(const FileId& a, const FileId& b) {
 inline constexpr char kMissing[] = "missing";
 
 struct PhoneSettings {
-  // The file that the stand-ins append their events to. Empty: nothing is simulated or recorded,
-  // and libzu finds no service.
+  // The file that the stand-ins append their events to. Empty: nothing is recorded, and libzu finds
+  // no service.
   std::string journal;
   // The contents of an integrity file, one for each opening; the last one repeats. Never empty.
   std::vector<std::string> integrity = {"1f"};

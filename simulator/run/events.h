@@ -10,18 +10,19 @@ namespace simulator {
 
 using Events = std::vector<nlohmann::json>;
 
-// The events of a journal's lines. Lines that are not JSON come from elsewhere and are skipped.
+// The events of a journal's lines. Lines that are not JSON objects are not events and are skipped.
 Events ParseEvents(const std::string& journal);
 
 // The value of `event` under `key`: a text as its original bytes, or a number. Returns an empty
-// text, or 0, if the key is missing.
+// text, or 0, if the event has no such value of this type.
 std::string TextOf(const nlohmann::json& event, const char* key);
 int64_t NumberOf(const nlohmann::json& event, const char* key);
 
 // True if the answer of the kernel or libzu in `event` is 0.
 bool IsSuccess(const nlohmann::json& event);
 
-// True if `event` describes the run. The others describe the journal itself.
+// True if `event` describes what the tool did. False for the events "journal", "start", "attached"
+// and "verdict", which the simulator adds.
 bool IsOfTheRun(const nlohmann::json& event);
 
 // Returns a text such as "ENOKEY: Required key not available".

@@ -178,7 +178,8 @@ Layout PlanLayout(const std::vector<std::string>& entries, InstalledAbi choice,
   return layout;
 }
 
-// True for lib/ABI/FILE. No name of this form leads out of its directory.
+// True for lib/ABI/FILE, if an installer accepts the name FILE. FILE is always a file in the
+// directory of its ABI, because it contains no "/" and ends with ".so".
 bool IsNameForInstallers(const std::string& entry) {
   const size_t slash = entry.find('/', strlen(kLibraryNames.prefix));
   return slash != std::string::npos && entry.find('/', slash + 1) == std::string::npos &&

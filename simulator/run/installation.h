@@ -39,8 +39,8 @@ class Installation {
   Installation& operator=(const Installation&) = delete;
 
   // Lays out the package at `file`. The file stays at its place if it is not a package, keeps its
-  // libraries inside, or has no libraries to lay out, or if `when` excludes it. Returns none on
-  // success, else the reason of the failure.
+  // libraries inside, or has no libraries to lay out, or if `when` excludes it. Returns the reason
+  // of a failure, else none.
   std::optional<std::string> LayOut(const std::string& file, InstallWhen when, InstalledAbi abi,
                                     const Deadline& deadline);
 
@@ -51,7 +51,7 @@ class Installation {
   // The journal with kInstalledDirectory instead of the name of this directory, so that the journal
   // is the same in each run.
   std::string WithStablePaths(const std::string& journal) const;
-  // The library entries of processors that were not asked for.
+  // The library entries of Arm ABIs that were not chosen.
   const std::set<std::string>& of_other_processors() const { return of_other_processors_; }
   // The library entries whose names no installer accepts, and those with accepted names that cannot
   // be extracted.

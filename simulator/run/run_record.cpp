@@ -185,7 +185,8 @@ void Reader::AddLibrary(const std::string& path, Attempt::Outcome outcome) {
   record_.libraries.push_back(attempt);
 }
 
-// Drops an attempt without a result. The package was refused, or the JAR is not trusted.
+// Adds the present attempt to the record. An attempt without a result is dropped: the package was
+// refused, or the JAR is not trusted.
 void Reader::CloseAttempt() {
   const std::optional<Attempt> attempt = std::exchange(attempt_, std::nullopt);
   if (!attempt || attempt->outcome == Attempt::Outcome::kBegun) return;

@@ -1,5 +1,5 @@
-// A run of the tool: its events, sorted by the file to which each belongs. TakeApart makes it from
-// the journal's events alone. Only the last members of RunRecord come from elsewhere.
+// A run of the tool: its events, sorted by the file to which each belongs. TakeApart fills a
+// RunRecord from the journal's events. Only its last members come from elsewhere.
 #pragma once
 
 #include <cstdint>
@@ -60,14 +60,14 @@ struct RunRecord {
   std::string file;
   std::string path;
   std::string installed;  // of a package that was laid out: <install>/base.apk; else empty
-  bool is_silent = true;  // the tool logged nothing and asked the phone for nothing
+  bool is_silent = true;  // the journal has no event of the tool before its exit
 
   std::vector<LogLine> opening_errors;  // before the first step
   bool is_dex_refused = false;
   LogMeaning dex_why = LogMeaning::kUnknown;  // of the first error logged before, if any
   std::vector<Attempt> libraries;             // in order
-  std::optional<Attempt> own;                 // the file itself; none: the tool did not get so far
-  std::optional<int64_t> verify_error;        // a plain JAR: 0, or why the kernel does not trust it
+  std::optional<Attempt> own;                 // the file itself; none: no attempt with a result
+  std::optional<int64_t> verify_error;        // a plain JAR: 0 if the kernel trusts it, else errno
   bool is_jar = false;
 
   struct Registration {
@@ -87,8 +87,8 @@ struct RunRecord {
   ToolIdentity tool;
   bool has_standard_input = true;  // the tool was started with a standard input
   bool has_no_packages = false;    // a directory without packages; the tool was not run
-  // Library entries of a package that was laid out. First those of processors that were not asked
-  // for, then those whose names no installer accepts, then those that cannot be extracted.
+  // Library entries of a package that was laid out. First those of Arm ABIs that were not chosen,
+  // then those whose names no installer accepts, then those that cannot be extracted.
   std::set<std::string> of_other_processors;
   std::vector<std::string> not_laid_out;
   std::vector<std::string> not_extracted;

@@ -2,9 +2,9 @@
 // any name.
 //
 // With a directory, SHA-256 digests are remembered across runs. Each digest is the name of a file
-// in the directory. That file contains the path of the signed file, for people who look there.
-// Without a directory, signed files are remembered as long as this object lives. They are digested
-// only if another file has the same length.
+// in the directory. That file contains the path of the signed file, for human readers. Without a
+// directory, signed files are remembered as long as this object lives. They are digested only if a
+// file of the same length is looked up.
 #pragma once
 
 #include <sys/stat.h>
@@ -21,7 +21,7 @@ class SignedBytes {
  public:
   // `directory` is created if it does not exist; empty: nothing is kept beyond this object. If
   // `shares` is false, added files are trusted only in later runs, so that the order of the files
-  // of this run does not matter. Then several threads may use the object.
+  // of this run does not matter. In this case several threads may use the object.
   SignedBytes(std::string directory, bool shares)
       : directory_(std::move(directory)), shares_(shares) {}
 

@@ -43,7 +43,8 @@ std::string OwnDescriptorPath(int fd) {
   return "/proc/" + std::to_string(getpid()) + "/fd/" + std::to_string(fd);
 }
 
-// The result for a directory for which the tool is not run. It contains only the reason.
+// The result for a directory, or an unreadable entry in it, for which the tool is not run. It
+// contains only the reason.
 FileRun RunOfDirectory(const ListedFile& directory) {
   FileRun run;
   const std::string path = Resolved(directory.name);

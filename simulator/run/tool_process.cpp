@@ -47,8 +47,8 @@ std::string ProgramDirectory() {
 
 namespace {
 
-// The stand-in is loaded only into the tool. A runner does not have the variable in its own
-// environment, but passes it to the tool.
+// The stand-in is loaded only into the tool. A runner does not have LD_PRELOAD in its own
+// environment, but sets it for the tool.
 Words CommandWords(const ToolCommand& command, Words* environment) {
   const std::string preload = "LD_PRELOAD=" + command.kernel;
   Words words = command.runner;

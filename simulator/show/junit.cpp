@@ -82,7 +82,8 @@ size_t Junit::Count(Outcome outcome) const {
 
 namespace {
 
-// Returns a line for each refused item and each warning. The line below it says what to do.
+// Returns two lines for each refused item and each warning: the fact, and below it what to do. A
+// missing installer has one line.
 std::string DetailText(const Report& report) {
   std::string text;
   const auto add = [&text](const std::string& line, const Reason& reason) {

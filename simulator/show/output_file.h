@@ -1,5 +1,5 @@
 // An output file that the command line names: the journal, the page, or a report for another
-// program. It replaces an existing file only if that is empty or of the same kind.
+// program. An existing regular file is replaced only if it is empty or of the same kind.
 #pragma once
 
 #include <optional>

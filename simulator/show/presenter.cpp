@@ -106,7 +106,7 @@ void Presenter::ShowAnswer(const RunRecord& run, const Report& report, const std
   status_ = std::max(status_, problem.empty() ? status : kCannotSimulate);
 }
 
-// This line is erased before anything else is written.
+// The progress line is erased before anything else is written.
 void Presenter::ShowProgress(const std::string& file, int seconds) {
   if (!has_progress_) return;
   std::cerr << kEraseLine << shown_ << " of " << file_count_ << " done; " << Printable(file, look_)

@@ -38,7 +38,8 @@ void Sarif::Add(const Report& report) {
   const size_t index = AddArtifact(report);
   const Json location = {{"physicalLocation",
                           {{"artifactLocation", {{"uri", UriOf(report.file)}, {"index", index}}}}}};
-  // A refusal that follows from another refusal has no result. The other one says what to fix.
+  // A refusal that follows from another refusal has no result. The result of that other refusal
+  // says what to fix.
   const bool has_origin =
       std::any_of(report.items.begin(), report.items.end(),
                   [](const Item& item) { return IsRefused(item) && !Follows(item); });

@@ -1,8 +1,8 @@
 // The report of a run for programs that read results of static analysis: one SARIF log (OASIS
 // Static Analysis Results Interchange Format, version 2.1.0). Each refused item is a result of
-// level "error", and each warning is a result of level "warning". The rules are the causes. A file
-// that was not judged is a notification of level "error", and the run then counts as not
-// successful. All texts from a file are escaped.
+// level "error", unless it follows from another refusal. Each warning is a result of level
+// "warning". The rules are the causes. A file that was not judged is a notification of level
+// "error", and the run then counts as not successful. All texts from a file are escaped.
 #pragma once
 
 #include <map>
@@ -46,7 +46,7 @@ class Sarif {
   size_t RuleOf(const Cause& cause, const char* level);
 
   std::map<std::string, size_t> rule_of_;      // by the cause's code
-  std::map<std::string, size_t> artifact_of_;  // by its text
+  std::map<std::string, size_t> artifact_of_;  // by its JSON
   Json rules_ = Json::array();
   Json artifacts_ = Json::array();
   Json results_ = Json::array();

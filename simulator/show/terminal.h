@@ -16,10 +16,10 @@ struct Look {
 // locale's characters are UTF-8.
 Look LookOfStandardOutput();
 
-// Returns `bytes` without anything that controls a terminal or misleads its reader. Control
-// characters, bytes that are not UTF-8, and characters that change the direction of writing are
-// shown as \xNN, byte by byte. If `look` has no UTF-8, all characters outside ASCII are also shown
-// in this form. A line feed at the end is removed.
+// Returns `bytes` without anything that controls a terminal or misleads its reader. Hidden
+// characters (IsHidden) and bytes that are not UTF-8 are shown as \xNN, byte by byte. If `look` has
+// no UTF-8, all characters outside ASCII are also shown in this form. A line feed at the end is
+// removed.
 std::string Printable(std::string_view bytes, const Look& look);
 
 enum class Colour { kPlain, kGreen, kRed, kYellow };

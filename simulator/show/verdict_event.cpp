@@ -67,8 +67,8 @@ std::string SignerJson(const std::string& scheme, const CertificateFacts& signer
   return Object(members);
 }
 
-// The JAR signature is shown with the key that the kernel got, even if the certificate shows
-// another one.
+// The JAR signature is shown with the key that the tool reads, even if other readers find another
+// key in the certificate.
 std::string SignersJson(const Report& report) {
   std::vector<std::string> signers;
   if (report.signer || report.key) {
@@ -159,7 +159,7 @@ std::string RangeJson(const RangeJudgement& range) {
   return Object(members);
 }
 
-// The tool beside the simulator was built together with it, so it has the same version.
+// The tool beside the simulator is of the same build, so it has the simulator's version.
 std::string ToolJson(const ToolIdentity& tool) {
   Members members = {{"sha256", EncodeText(tool.sha256)}};
   if (tool.is_own) members.emplace_back("version", EncodeText(APKTOOLKIT_VERSION));

@@ -1,5 +1,5 @@
-// The words of a report, for both the terminal and the page. They contain names and details from
-// the files, unchanged. The caller must escape them.
+// The words of a report, for all outputs. They contain names and details from the files, unchanged.
+// The caller must escape them.
 #pragma once
 
 #include <optional>
@@ -33,8 +33,8 @@ const char* MoodCode(Mood mood);
 // number.
 std::string Summary(const std::vector<Verdict>& verdicts, std::optional<size_t> unseen = {});
 
-// The owner of the package: its name, the signer and the key and, if phones install it for another
-// signer, that signer. `ellipsis` replaces the middle of a digest.
+// The package's name, its signer and key, and the signer for whom phones install it, if that is
+// another one. `ellipsis` replaces the middle of a digest.
 std::vector<std::string> OwnerFacts(const Report& report, const char* ellipsis);
 
 // The JAR signer and the key, such as "CN=Vault, RSA-2048, key 98302ce8…f64646".
@@ -82,15 +82,16 @@ inline const std::string& PathForTool(const Report& report) {
 inline constexpr char kLaidOutText[] =
     "its libraries were laid out beside it, as an installer does; --install=no turns this off";
 
-// True if the cure is shown below the item. It is shown once for neighbours with the same cure, and
-// not for a consequence of another cause. `next` is the next item, or null.
+// True if the cure is shown below the item. It is not shown if nothing is wrong, or for a
+// consequence of another cause. Of neighbours with the same cause, only the last one shows it.
+// `next` is the next item, or null.
 bool HasCure(const Item& item, const Item* next);
 
 // The text at the link, or "not reached" beyond a break.
 std::string TextOf(const Link& link);
 
-// Label and value for each fact. The labels are those of apksigner, so that one search finds both
-// outputs.
+// Label and value for each fact. The labels are those of apksigner, except for the modulus, so that
+// one search finds both outputs.
 using Rows = std::vector<std::pair<std::string, std::string>>;
 // The facts of a certificate, as readers other than the tool find them.
 Rows CertificateRows(const CertificateFacts& certificate);

@@ -1,7 +1,7 @@
-// The table of causes: why something was not signed, and what to do. A row has all facts about a
-// cause. The tables in docs/messages.md and the codes in docs/journal.schema.json are written from
-// the rows (tests/project/messages_test.py --write). A code never changes its meaning, because
-// scripts match on it.
+// The table of causes: the reason for each failure, refusal and warning, and what to do about it. A
+// row has all facts about a cause. The tables in docs/messages.md and the codes in
+// docs/journal.schema.json are written from the rows (tests/project/messages_test.py --write). A
+// code never changes its meaning, because scripts match on it.
 #pragma once
 
 namespace simulator {
@@ -25,8 +25,8 @@ enum class Group {
 enum class Severity {
   kFailed,   // there is no result for the file
   kUnseen,   // the tool left the file alone
-  kRefused,  // it should have been signed or registered, but was not
-  kFollows,  // the same, as a consequence of another cause that must be fixed first
+  kRefused,  // not signed, registered, installed or accepted, but it should have been
+  kFollows,  // like kRefused, but only because of another cause, which must be fixed first
   kAbsent,   // there is nothing to sign; a refusal under --strict
   kNothing,  // there is nothing to sign
   kDoubt,    // a warning; a refusal under --strict
@@ -42,7 +42,7 @@ struct Cause {
   Group group;
   Severity severity;
   ChainLink link;      // the link that the cause breaks; kNone: it breaks none
-  const char* log;     // the messages that show it in the log, for docs/messages.md
+  const char* log;     // the messages that show the cause in the log, for docs/messages.md
   const char* reason;  // the end of a sentence such as "not signed: …"; "%s" is replaced
   const char* cure;    // one or more sentences
 };

@@ -141,7 +141,8 @@ CertificateFacts JarSigner(const Report& report) {
   return signer;
 }
 
-// The signers of the newest scheme that phones of these levels verify.
+// The signers of the newest scheme that phones of these levels verify. Empty if these phones refuse
+// the package.
 std::vector<const CertificateFacts*> NewestSigners(const RangeJudgement& range) {
   std::vector<const CertificateFacts*> signers;
   if (!range.is_verified) return signers;
@@ -151,8 +152,9 @@ std::vector<const CertificateFacts*> NewestSigners(const RangeJudgement& range) 
   return signers;
 }
 
-// The signers for whom any of the phones installs the package, each once, in a fixed order. If the
-// installer was not asked, these are the signers of the newest scheme that the file names.
+// The signers for whom any of the phones installs the package, each once, in a fixed order. Without
+// a judgement of the installer, these are the signers of the newest scheme that the file names, or
+// else the JAR signer.
 Signers InstalledSigners(const Report& report) {
   Signers signers;
   for (const RangeJudgement& range : report.installer.ranges) {

@@ -1,5 +1,5 @@
-// The demands of the command line on each file, in addition to the phone's answer: the expected
-// signer (--signer), and no warnings (--werror).
+// The demands on each file in addition to the phone's answer: the expected signer (--signer), no
+// warnings (--werror), and one signer for all files of a package name (always).
 #pragma once
 
 #include <map>
@@ -28,9 +28,10 @@ class Gate {
   // `options` must outlive this object.
   explicit Gate(const GateOptions& options) : options_(options) {}
 
-  // Adds an item to the report for each demand that the file does not meet. A good verdict becomes
-  // kNotAccepted. Called once per file, in the order of the command line, because each file is
-  // compared with the first file of its package name.
+  // Adds an item to the report for each demand that the file does not meet. A good verdict then
+  // becomes kNotAccepted. Changes nothing for a file that was not looked at or not simulated.
+  // Called once per file, in the order of the command line, because each verified package is
+  // compared with the first one of its package name.
   void Judge(Report* report);
 
  private:

@@ -49,7 +49,8 @@ std::string TakersText(const Judgement& judgement) {
          Joined(schemes);
 }
 
-// Phones verify only the newest scheme that they know. All signers of that scheme count.
+// Phones verify only the newest of the package's schemes that they know. All signers of that scheme
+// count.
 const CertificateFacts* OtherSigner(const Judgement& judgement, const Report& report) {
   const CertificateFacts* other = nullptr;
   for (const RangeJudgement& range : judgement.ranges) {

@@ -60,8 +60,8 @@ Reason WhyKernelDidNotSign(const Attempt& attempt) {
 namespace {
 
 // Pairs each library with its attempt. The tool handles the libraries in the order of the archive,
-// and `present` has that order. If there are more attempts than libraries, the pairs cannot be
-// right. The result then has one library for each attempt, known only by its path.
+// and `present` has that order. If attempts are left over, the pairs cannot be right. The result
+// then has one library for each attempt, with only a path.
 std::vector<Library> MatchAttempts(const RunRecord& run, const std::vector<LibraryFacts>& present) {
   std::vector<Library> libraries;
   auto attempt = run.libraries.begin();
@@ -126,8 +126,8 @@ Reason WhyNotVerified(const Library& library, const RunRecord& run, const Packag
   return {is_changed_inside ? &cause::kLibraryChangedInside : &cause::kLibraryChanged, ""};
 }
 
-// The tool does not log why a file could not be opened. `library.error` is the errno of
-// opening it again.
+// The tool does not log why a file could not be opened. The simulator therefore opens the file as
+// well: `library.error` is the errno of its attempt.
 Reason WhyNotThere(const LibraryFacts& library, const RunRecord& run, const PackageFacts& facts) {
   const int error = library.error;
   if (error == EACCES || error == EPERM) return {&cause::kLibraryNoPermission, ""};

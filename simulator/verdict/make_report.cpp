@@ -109,7 +109,7 @@ ExitStatus StatusOf(Verdict verdict) {
 
 namespace {
 
-// The file itself.
+// The item for the file itself.
 Item OwnItem(const RunRecord& run, const PackageFacts& facts, const JudgeOptions& options) {
   const ItemKind kind = KindOf(run);
   constexpr const char* kNames[] = {"package", "JAR", "file"};
@@ -126,7 +126,7 @@ Item OwnItem(const RunRecord& run, const PackageFacts& facts, const JudgeOptions
   }
   Item item = {kind, name, "", ItemState::kDone, {}};
   if (reason.cause != nullptr) item = NotDone(kind, name, reason, options);
-  // The tool asks the kernel only for verified packages.
+  // The tool tries to sign a package only after it verified the package.
   item.is_verified = kind == ItemKind::kPackage && run.own.has_value();
   return item;
 }
@@ -182,7 +182,7 @@ void AddKeyItems(const RunRecord& run, const JudgeOptions& options, std::vector<
 }
 
 // Adds all other failures. A message from the opening of the file usually explains why a package
-// was refused, or which part of a package a JAR does not have. If the package was signed
+// was refused, or which part of a package a JAR does not have. If the tool tried to sign the file
 // nevertheless, the message is a separate failure.
 void AddToolItems(const RunRecord& run, const JudgeOptions& options, std::vector<Item>* items) {
   const auto add = [&](const Reason& reason) {

@@ -100,7 +100,7 @@ Reason WhyDexRefused(LogMeaning why) {
 }
 
 Reason WhyNotOpened(const PackageFacts& facts, int64_t code) {
-  constexpr int64_t kNoEntries = -6;  // which the zip library's header does not name
+  constexpr int64_t kNoEntries = -6;  // the zip library's header has no name for it
   constexpr const Cause* kCauses[] = {
       nullptr,           &cause::kFolder,     &cause::kSpecialFile, &cause::kEmptyFile,
       &cause::kTextFile, &cause::kCutArchive, &cause::kNoArchive,   nullptr};
@@ -168,7 +168,8 @@ Reason WhyManifestRefused(const Lines& errors, const JarSignatureFacts& jar) {
   return {has_none ? &cause::kManifestDigest : &cause::kManifestChanged, ""};
 }
 
-// The tool logs nothing about an entry that is missing or cannot be extracted.
+// The tool logs nothing about a manifest or a signature file that is missing or cannot be
+// extracted.
 Reason WhySilentlyRefused(const PackageFacts& facts) {
   const JarSignatureFacts& jar = facts.jar;
   if (facts.archive_result != 0) return {&cause::kDamagedArchive, ""};

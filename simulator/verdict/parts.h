@@ -8,23 +8,25 @@
 
 namespace simulator {
 
-// Why the tool refused a whole file before it asked the kernel. The log says where it stopped, and
-// the facts of the file say why. For a file that is neither signed nor a plain JAR.
+// Why the tool refused a whole file before it asked the kernel. The log shows at which step the
+// tool stopped, and the facts of the file show why. The file must be neither signed nor a plain
+// JAR.
 Reason WhyRefused(const RunRecord& run, const PackageFacts& facts);
 
-// Why the tool did not look at a file, or was not run for a directory. A null cause if the file
-// has no such reason.
+// Why the tool did not look at a file, or was not run for a directory. A null cause if neither
+// applies.
 Reason WhyNotLookedAt(const RunRecord& run, const PackageFacts& facts);
 
 // Why an archive without AndroidManifest.xml is probably not meant to be a JAR: it is an app bundle
 // or a set of packages, or has parts of a package. A null cause if it may be a JAR.
 Reason WhyTakenForAJar(const PackageFacts& facts);
 
-// Why the tool refused a file, if the tool reads an encrypted entry: an entry of the JAR signature,
-// AndroidManifest.xml or classes.dex. A null cause if none of these is encrypted.
+// Why the tool refused a file, if an entry that the tool reads is encrypted: an entry of the JAR
+// signature, AndroidManifest.xml or classes.dex. A null cause if none of these is encrypted.
 Reason WhyEncrypted(const PackageFacts& facts);
 
-// Why the kernel did not sign the file; a null cause if it did.
+// Why the kernel refused to sign the file, or why the tool did not ask the kernel. A null cause for
+// every other outcome.
 Reason WhyKernelDidNotSign(const Attempt& attempt);
 
 // Adds an item for each native library of the package, with its result. The first item in `items`
@@ -40,8 +42,8 @@ void AddInstallerItem(const Judgement& judgement, const JudgeOptions& options,
 bool IsJarSigner(const PublicKey& key, const Report& report);
 
 // Facts that matter to the user although they change nothing for the kernel. Reads only the items,
-// the signers and the key of the report. Leaves out a fact that the file's own item already has.
-// `now` is that of JudgeOptions.
+// the signer and the key of the report. Leaves out a fact that the file's own item already has.
+// `now` is JudgeOptions::now.
 std::vector<Reason> FindWarnings(const RunRecord& run, const PackageFacts& facts,
                                  const Report& report, int64_t now = 0);
 

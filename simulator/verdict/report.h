@@ -43,7 +43,7 @@ enum class ItemKind {
 
 enum class ItemState {
   kDone,     // signed or registered
-  kRefused,  // should have been signed or registered, but was not
+  kRefused,  // not signed, registered, installed or accepted, but should have been
   kAbsent,   // a library that is not beside the package; with --strict it is kRefused
   kNothing   // nothing to sign
 };
@@ -71,13 +71,13 @@ struct Item {
 struct KernelKey {
   std::string sha256;    // of its modulus; in hexadecimal
   int bits = 0;          // 0: not known
-  bool was_got = false;  // true if the kernel got this digest; else the tool would send it
+  bool was_got = false;  // true: the kernel got this digest; false: the tool would send it
 };
 
 // The size of a part of the package.
 struct Share {
   uint64_t entries = 0;
-  uint64_t bytes = 0;  // in the archive
+  uint64_t bytes = 0;  // compressed
 };
 
 struct Protection {
@@ -111,7 +111,7 @@ struct Report {
   std::vector<Item> items;
   std::vector<Reason> warnings;
 
-  std::string payload;                     // the payload of the kernel, in hexadecimal; empty: none
+  std::string payload;                     // that the kernel got, in hexadecimal; empty: none
   std::optional<KernelKey> key;            // of a package with an RSA key
   std::optional<CertificateFacts> signer;  // of the JAR signature
   std::vector<std::string> schemes;        // the file's schemes: "v1", "v2", …
@@ -133,7 +133,7 @@ const Item* DecisiveItem(const Report& report);
 // Returns such a signer, or null if there is none. Reads only the signer and the key of the report.
 const CertificateFacts* OtherSigner(const Judgement& judgement, const Report& report);
 
-// True for an item of the tool's own run. The others belong to the installer or to the command
+// True for an item of the tool's own run. All other items belong to the installer or to the command
 // line.
 bool IsByTool(const Item& item);
 

@@ -53,7 +53,7 @@ bool IsJarSigner(const PublicKey& key, const Report& report) {
 
 namespace {
 
-// Warns if other programs find another signer or package name than the tool does.
+// Warns if other programs may find another signer or package name than the tool does.
 void WarnOfTwoFaces(const PackageFacts& facts, const Report& report, Reasons* warnings) {
   const JarSignatureFacts& jar = facts.jar;
   if (report.key && jar.certificate) {
@@ -97,7 +97,8 @@ void WarnOfSigners(const PackageFacts& facts, const Report& report, Reasons* war
   }
 }
 
-// Collisions of SHA-1 and MD5 are known. Lists each use of them in the JAR signature.
+// Collisions of SHA-1 and MD5 are known. Lists each use of them in the JAR signature and in the
+// certificates of all schemes.
 void WarnOfWeakDigests(const PackageFacts& facts, Reasons* warnings) {
   const auto is_weak = [](const std::string& name) {
     return name.compare(0, 4, "SHA1") == 0 || name.compare(0, 3, "MD5") == 0;

@@ -35,8 +35,8 @@ std::string LevelText(const LevelRange& levels);
 // was asked about install it.
 std::string TakersText(const Judgement& judgement);
 
-// The name of the JAR signer's key, such as "RSA-2048": by the tool's reading, else by the
-// certificate. Empty if neither of them has a key.
+// The name of the JAR signer's key, such as "RSA-2048": of the report's key, or else of the
+// certificate's key. Empty if the report has neither.
 inline std::string KeyName(const Report& report) {
   const PublicKey shown = report.signer ? report.signer->key : PublicKey();
   const std::string algorithm = report.key ? "RSA" : shown.algorithm;

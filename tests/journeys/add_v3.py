@@ -1,7 +1,8 @@
 #!/usr/bin/env python3
 """add_v3.py APK CERTIFICATE KEY FIRST LAST [ID]: adds a signature to the signing block of the package,
-beside those in it: v3 for phones of the API levels FIRST to LAST, or another scheme of the same form
-by its ID in hexadecimal. openssl signs."""
+and keeps the signatures in the block. Makes the block if there is none. The signature is a v3 signature
+for phones of the API levels FIRST to LAST. With ID, in hexadecimal, it is of another scheme that has
+the form of v3. openssl signs."""
 
 import hashlib
 import struct
@@ -22,7 +23,7 @@ def openssl(*words, data=None):
 
 
 def content_digest(sections):
-    """The digest of the digests of all pieces of 1 MiB."""
+    """The digest of the digests of all pieces. A piece has at most 1 MiB."""
     pieces = [section[at:at + (1 << 20)] for section in sections for at in range(0, len(section), 1 << 20)]
     digests = [hashlib.sha256(b"\xa5" + struct.pack("<I", len(piece)) + piece).digest() for piece in pieces]
     return hashlib.sha256(b"\x5a" + struct.pack("<I", len(pieces)) + b"".join(digests)).digest()
@@ -34,8 +35,8 @@ def main(path, certificate, key, first, last, scheme=V3):
     directory = struct.unpack_from("<I", data, end + 16)[0]
     has_block = data[directory - 16:directory] == MAGIC
     start = directory - struct.unpack_from("<Q", data, directory - 24)[0] - 8 if has_block else directory
-    # The digest covers the end record with the offset of the signing block in place of that of the
-    # directory.
+    # The digest covers the end record with the offset of the signing block in place of the
+    # directory's offset.
     signed_end = data[end:end + 16] + struct.pack("<I", start) + data[end + 20:]
     digest = content_digest([data[:start], data[directory:end], signed_end])
 

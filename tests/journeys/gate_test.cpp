@@ -54,7 +54,7 @@ ProcessResult Simulated(const Lines& words) {
   return RunProcess(command);
 }
 
-// The verdicts of the files, then the status. No installer is asked, unless `words` turn it on.
+// The verdicts of the files, then the status. The installer is off, unless `words` turn it on.
 Lines Verdicts(Lines words) {
   words.insert(words.begin(), {"--installer=off", "--quiet"});
   const ProcessResult run = Simulated(words);
@@ -234,7 +234,7 @@ TEST(Verdict, TellsWhatAProgramHasToKnowOfFileToolAndSigner) {
   const auto sha256 = [](const std::string& file) {
     return RunProcess({"sha256sum", file}).output.substr(0, 64);
   };
-  // Under an emulator, ToolPath() is a script beside the directory of the programs.
+  // Under an emulator, ToolPath() is a script, and its directory is beside that of the programs.
   std::filesystem::path tool = ToolPath();
   if (AreProgramsEmulated()) tool = tool.parent_path() / "../bin/apktoolkit";
   const std::string apk = Apk("changed-dex");

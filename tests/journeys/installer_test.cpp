@@ -1,5 +1,5 @@
-// The judgement of the phones' installer beside that of the tool, for real packages: the lines that
-// a person reads.
+// Tests the judgement of the phones' installer beside the tool's, for real packages: in the lines
+// that a person reads, and in the journal.
 #include <gtest/gtest.h>
 
 #include <filesystem>
@@ -178,8 +178,8 @@ TEST(Installer, AnotherSignerIsSaidInTheVerdict) {
             Lines({"SIGNED", "phones of API 27 install it, verified by v2", "-> 0"}));
 }
 
-// If the verifier is asked about all levels at once, it names one signer for all of them: that of
-// the first key.
+// If the verifier is asked about all levels at once, it names one signer for all of them: the
+// signer with the first key.
 TEST(Installer, SignerForLaterPhonesAloneIsFound) {
   const Lines told = Told("later-v3");
   EXPECT_EQ(told.front(), "NOT INSTALLABLE");
@@ -292,7 +292,7 @@ TEST(Installer, FileThatChangesBeforeItsAnswerHasNoResult) {
   EXPECT_EQ(told_with("ln '" + apk + "' '" + apk + ".link'").status, 0);
 }
 
-// Java is missing, and no message says so.
+// The run finds no Java, but no message says so.
 TEST(Installer, IsNotAskedAboutAJar) {
   const TempDir directory;
   const ProcessResult made = RunProcess(

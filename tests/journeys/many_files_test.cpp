@@ -15,8 +15,8 @@ namespace {
 namespace fs = std::filesystem;
 using Lines = std::vector<std::string>;
 
-// A directory `good` with a good package, and a directory `shop` with two good packages and one
-// unsigned package.
+// A directory `good` with a good package, and a directory `shop` with two good packages, one
+// unsigned package and one text file.
 class ManyFiles : public testing::Test {
  protected:
   ManyFiles() {

@@ -154,7 +154,7 @@ TEST_F(TamperedPackage, AddedDexFileThatTheManifestDoesNotNameIsRefused) {
   ExpectDexFileRefusedAfter({Log(6, "Can't find file in META-INF/MANIFEST.MF: classes.dex\n")});
 }
 
-// Deliberate: other entries are never digested.
+// Deliberate: the tool compares only one dex file with the manifest, classes.dex.
 TEST_F(TamperedPackage, SecondDexFileIsNotLookedAt) {
   package_ = MakePackage([] {
     PackageOptions options;

@@ -20,7 +20,7 @@ namespace {
 
 using nlohmann::json;
 
-// The SHA-256 digest of the victim's modulus, that of the key rsa-2048.
+// The SHA-256 digest of the victim's modulus. The victim's key is rsa-2048.
 std::string VictimsDigest() { return Hex(DigestOf(Digest::kSha256, ModulusOf("rsa-2048"))); }
 
 // A key with the public exponent 65537, and how to sign with it.

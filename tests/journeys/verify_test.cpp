@@ -121,7 +121,7 @@ TEST(Verify, WhatMayNotBeReadCannotBeOpened) {
                file + ": cannot be opened (errno 13, EACCES)\n");
 }
 
-// A FIFO does not make the program wait. The kernel's answer for a FIFO or a device does not count.
+// A FIFO does not make the program wait. The kernel's answer counts only for a regular file.
 TEST(Verify, WhatIsNoRegularFileIsNotTrusted) {
   const TempDir directory;
   const std::string fifo = directory / "fifo";
@@ -174,7 +174,7 @@ TEST(Verify, EachFileHasOneLineWhateverItsName) {
                "gr\xc3\xbcn \xff: not trusted (errno 22, EINVAL)\n");
 }
 
-// A kernel refuses an unknown fcntl command with EINVAL.
+// A kernel without the feature does not know its fcntl command, and refuses it with EINVAL.
 TEST(Verify, WithoutTheFeatureNothingIsTrusted) {
   const TempDir directory;
   const std::string file = directory.Write("file", {});

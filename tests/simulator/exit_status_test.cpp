@@ -189,7 +189,8 @@ TEST(ExitStatus, ThreeWhenThePageCannotBeWritten) {
             "apktoolkit-sim: cannot write the page /dev/full: No space left on device\n");
 }
 
-// The run fails if nobody reads the pipe. A reader that opens the pipe a little late is enough.
+// The run fails if nobody reads the pipe. It does not fail if a reader opens the pipe a little
+// late.
 TEST(ExitStatus, ThreeWhenThePageIsAPipeThatNobodyReads) {
   const Probe probe({"sign 3 0100ab"});
   const std::string pipe = probe.directory() / "page";

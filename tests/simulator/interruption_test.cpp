@@ -13,8 +13,8 @@ namespace {
 
 // Runs a command in its own process group. As soon as a file that matches `pattern` is not empty,
 // sends `signal` to the command, or to the whole group as the keyboard does. `ended_by` is the
-// signal that ended the command (0 or less if none did), and `seconds` the time from the signal to
-// the end.
+// signal that ended the command (0 or less if none did). `seconds` is the time from the signal to
+// the end of the command.
 struct Interrupted {
   enum class Target { kCommand, kGroup };
 
@@ -81,7 +81,8 @@ TEST(Interruption, OfTheWholeProcessGroupIsNoRefusal) {
   EXPECT_EQ(log["runs"][0]["invocations"][0]["executionSuccessful"], false);
 }
 
-// The tool has long ended. Without the verifier's answer there is no result.
+// The tool has already ended when the signal comes. Without the verifier's answer there is no
+// result.
 TEST(Interruption, WhileTheInstallerIsAskedIsNoAnswerOfTheInstaller) {
   const TempDir directory;
   const std::string file = directory / "base.apk", pid = directory / "pid";
@@ -149,8 +150,8 @@ TEST(Page, OfAnInterruptedRunHasWhatWasDone) {
   EXPECT_NE(text.find("</html>\n"), std::string::npos);
 }
 
-// Each file has its test case. The interrupted file has an error, and so have the last two, which
-// were never begun.
+// Each file has its test case. The interrupted file has an error. The last two files were never
+// begun, and also have an error.
 TEST(Reports, OfAnInterruptedRunAreWholeAndNotGreen) {
   const Probe good({"sign 3 0000"});
   const Probe slow({"sign 3 0000", "pid", "sleep 60"});

@@ -1,4 +1,4 @@
-// Runs apktoolkit-sim with the probe as the tool.
+// Runs apktoolkit-sim with the probe or with apktoolkit as the tool.
 #pragma once
 
 #include <algorithm>
@@ -27,8 +27,8 @@ inline Lines FirstLines(const ProcessResult& result, size_t count) {
   return lines;
 }
 
-// Runs a command line in the shell: `script`, in which "$@" is the simulator with the probe as its
-// tool.
+// Runs `script` in the shell. In the script, "$@" is the simulator with the probe as its tool, and
+// then `words`.
 inline ProcessResult InShell(const std::string& script, const Lines& words) {
   Lines command = {"bash", "-c", script, "bash", SimulatorPath(), "--tool", PROBE_PATH};
   command.insert(command.end(), words.begin(), words.end());

@@ -96,7 +96,7 @@ TEST(Files, HaveNoColoursWhereTheUserWantsNone) {
   EXPECT_EQ(shown("-u NO_COLOR"), "\x1b[32mTRUSTED JAR\x1b[0m  " + good.path() + "\r\n");
 }
 
-// The author of a file chooses the names in it.
+// The name of a file may contain control sequences for the terminal.
 TEST(Files, NamesReachNoTerminalAsTheyAre) {
   const TempDir directory;
   const std::string odd = directory.Write("-\x1b]0;x\x07", ToBytes("sign 3 0000\n"));
@@ -236,7 +236,7 @@ TEST(Simulation, HasNoResultForAFileThatWasChangedMeanwhile) {
   EXPECT_EQ(changed.output, "NOT SIMULATED  " + file + "   it was changed during the run\n");
   EXPECT_EQ(changed.status, 3);
   EXPECT_EQ(Told({"--quiet", file}).status, 0);
-  // A file that the tool could not open does not count as changed.
+  // A directory never counts as changed.
   EXPECT_EQ(Told({"--quiet", directory.path()}).status, 1);
 }
 

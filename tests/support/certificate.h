@@ -1,8 +1,8 @@
-// Builds X.509 certificates (RFC 5280 §4.1), good ones and every kind of malformed one.
+// Builds X.509 certificates (RFC 5280 §4.1), good and malformed.
 //
-// Each field has the DER for its place, including the identifier and length octets. A test changes
-// a certificate by assigning to a field. If a field is left unset, Build makes it from the keys and
-// the digest.
+// Each field of type Bytes has the DER for its place, including the identifier and length octets. A
+// test changes a certificate by assigning to a field. If a field is left unset, Build makes it from
+// the keys and the digest.
 #pragma once
 
 #include <optional>
@@ -55,7 +55,7 @@ struct Certificate {
   std::vector<Bytes> extensions;  // each an Extension; none: no [3]
   Bytes tbs_tail;                 // anything after the extensions
 
-  std::optional<Bytes> tbs;  // instead of all the fields above
+  std::optional<Bytes> tbs;  // in place of all fields of the tbsCertificate
   std::optional<Bytes> signature_algorithm;
   std::optional<Bytes> signature;  // the BIT STRING
 

@@ -1,5 +1,5 @@
-// Writes Android's compiled XML, good and bad: a string pool, then one node for each call. Nothing
-// checks that elements nest.
+// Writes Android's compiled XML, good and bad: a string pool, then the nodes in the order of the
+// calls. Nothing checks that elements nest.
 #pragma once
 
 #include <cstdint>
@@ -68,5 +68,6 @@ class CompiledXml {
   Bytes nodes_;
 };
 
-// The manifest of a package of this name. It may ask for the secure-storage permission.
+// The manifest of a package of this name. It requests the secure-storage permission if
+// `secure_storage` is true.
 Bytes CompiledManifest(const std::string& package_name, bool secure_storage = false);

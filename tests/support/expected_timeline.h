@@ -27,8 +27,8 @@ std::string Exit(int status);
 
 std::string Timeline(std::initializer_list<std::string> parts);
 
-// The payload for a package that is signed with the RSA test key, made by hand: the length 32 as
-// two bytes, low byte first, and the SHA-256 digest of the modulus.
+// The payload for a package that is signed with the RSA test key, made without the tool's code: the
+// length 32 as two bytes, low byte first, and the SHA-256 digest of the modulus.
 Bytes PackagePayload(const std::string& key = "rsa-2048");
 
 // The parts that most journeys share.

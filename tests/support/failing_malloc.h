@@ -1,4 +1,4 @@
-// Makes chosen allocations fail, and checks memory that is freed.
+// Makes one chosen allocation fail, and checks memory that is freed.
 //
 // A test program linked with -Wl,--wrap=malloc,--wrap=free sends the calls of its own objects here,
 // and this file calls the real functions. The platform's libraries and the sanitizers call the real
@@ -21,9 +21,10 @@ class FailingMalloc {
   int calls() const { return calls_; }
   // True if the call that must fail was made.
   bool failed() const { return failing_call_ != 0 && calls_ >= failing_call_; }
-  // The blocks that were returned and not yet freed.
+  // The number of blocks that were returned and not yet freed.
   int live() const;
-  // The blocks that were freed, and those of them that had bytes other than zero at that time.
+  // The number of blocks that were freed, and of those that had bytes other than zero when they
+  // were freed.
   int freed() const { return freed_; }
   int freed_unwiped() const { return freed_unwiped_; }
 

@@ -89,7 +89,8 @@ MemoryFile::MemoryFile(const Bytes& content, const std::string& name)
 
 MemoryFile::~MemoryFile() { close(fd_); }
 
-// Keeps the file under a number far above: another FreeDescriptor may free the lowest number.
+// Keeps the file under the number 100 + fd. The lowest free number may be one that another
+// FreeDescriptor frees.
 FreeDescriptor::FreeDescriptor(int fd) : fd_(fd), kept_(dup2(fd, 100 + fd)) { close(fd); }
 
 FreeDescriptor::~FreeDescriptor() {

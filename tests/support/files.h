@@ -1,5 +1,5 @@
-// Directories and files for one test, on disk and in memory. They are removed when the test is
-// over. If one cannot be made, the program aborts.
+// Directories and files for one test, on disk and in memory. Each object removes its directory or
+// file when it is destroyed. If a directory or file cannot be made, the program aborts.
 #pragma once
 
 #include <string>

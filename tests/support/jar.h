@@ -14,7 +14,8 @@ std::string Base64Encode(const Bytes& data);
 // "SHA-256-Digest". For any other attribute, the text "AAAA".
 std::string DigestText(const std::string& attribute, const Bytes& data);
 
-// A manifest or signature file, line by line. Each line ends with CR LF and is cut at 72 bytes.
+// A manifest or signature file, line by line. Each line has at most 72 bytes, including the CR LF
+// at its end. A longer attribute continues on the next line.
 class JarText {
  public:
   // Starts with the main section's first line, such as "Manifest-Version: 1.0".

@@ -1,5 +1,6 @@
-// A write lease on a file (fcntl, F_SETLEASE). Its holder gives it up some time after another
-// process, or this one, opens the file. Until then an open waits, or fails with EWOULDBLOCK.
+// A write lease on a file (fcntl, F_SETLEASE). Its holder gives the lease up at least 100 ms after
+// a process, possibly this one, tries to open the file. Until then, the open waits, or fails with
+// EWOULDBLOCK if it has O_NONBLOCK.
 #pragma once
 
 #include <fcntl.h>
@@ -25,7 +26,7 @@ class Lease {
   Lease(const Lease&) = delete;
   Lease& operator=(const Lease&) = delete;
 
-  // False if the file system has no leases.
+  // False if the kernel refused the lease, for example because the file system has no leases.
   bool IsHeld() const { return is_held_; }
   bool WasGivenUp() const { return was_given_up_; }
 

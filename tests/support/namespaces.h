@@ -4,8 +4,8 @@
 #include <string>
 #include <vector>
 
-// True if this kernel, and the container that this may run in, allow namespaces. Otherwise a test
-// that needs them is skipped with the reason kNoNamespaces.
+// True if the kernel allows namespaces, and the container too if the test runs in one. Otherwise a
+// test that needs them is skipped with the reason kNoNamespaces.
 bool CanMakeNamespaces();
 inline constexpr char kNoNamespaces[] = "the kernel, or this container, allows no user namespaces";
 

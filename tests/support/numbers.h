@@ -91,7 +91,7 @@ struct Aliased {
 };
 
 // Calls `operation`, which returns a result code, once for each of its allocations, and makes that
-// allocation fail.
+// allocation fail. In the last call, no allocation fails.
 template <typename Operation>
 void ExpectNoMemoryAtEveryAllocation(const Operation& operation) {
   for (int call = 1;; ++call) {

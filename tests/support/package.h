@@ -1,9 +1,9 @@
 // Makes whole packages and JARs: entries, the manifest that lists them, the signature file and the
 // signature block.
 //
-// A package is made in steps, so that a test can come between them. `MakePackage` signs; `Package`
-// gives access to every entry, to tamper with it, remove it or add one; `Build` or `WriteTo` makes
-// the archive.
+// A package is made in steps, so that a test can change it between them. `MakePackage` signs;
+// `Package` gives access to every entry, to tamper with it, remove it or add one; `Build` or
+// `WriteTo` makes the archive.
 #pragma once
 
 #include <functional>

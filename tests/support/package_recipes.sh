@@ -19,7 +19,7 @@ make_unsigned_package() {
   rm -r "$work"
 }
 
-# put_android_manifest APK MANIFEST: makes the package again, with only this manifest, in compiled
+# put_android_manifest APK MANIFEST: makes the package anew, with only this manifest, in compiled
 # form.
 put_android_manifest() {
   aapt package -f -M "$2" -F "$1" -I /usr/share/android-framework-res/framework-res.apk
@@ -30,8 +30,8 @@ compile_library() {  # TARGET LIBRARY
     "$recipes_dir/vault/vault.c"
 }
 
-# put_entries APK DIRECTORY ENTRY...: packs files of the directory in place of the entries of these
-# names.
+# put_entries APK DIRECTORY ENTRY...: packs the named files of the directory, in place of any
+# entries of these names.
 put_entries() {
   local apk directory=$2
   apk=$(realpath "$1")

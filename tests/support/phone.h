@@ -20,16 +20,18 @@ struct Phone {
   Phone(const Phone&) = delete;
   Phone& operator=(const Phone&) = delete;
 
-  // The defaults are a healthy phone, and a test changes them. The texts of the integrity file, one
-  // for each opening. The last text repeats. kNoFile means that this opening fails.
+  // The defaults are a healthy phone, and a test changes them.
+
+  // The texts of the integrity file, one for each opening. The last text repeats. kNoFile means
+  // that this opening fails.
   std::deque<std::string> integrity = {"1f\n"};
   static constexpr char kNoFile[] = "no file";
   int sign_errno = 0;             // 0: the kernel signs
   int verify_errno = 0;           // 0: the kernel trusts every file
   int zu_result = 0;              // the answer of libzu
-  int zu_attribute_size = -1;     // of "user.zu", on every file; -1: missing
+  int zu_attribute_size = -1;     // of "user.zu", on every file; -1: the real attribute
   std::vector<int> nameless_fds;  // descriptors whose path cannot be resolved
-  // The answer of fcntl to a valid request to sign or to verify.
+  // The result of fcntl for a request to sign or to verify, if its errno above is 0.
   int kernel_result = 0;
 
   // Called before the integrity file is opened: after all checks, and before the kernel signs.
@@ -49,8 +51,9 @@ struct Phone {
   // The actions of the code under test, in order: "integrity PATH", "sleep MICROSECONDS", "sign FD
   // PAYLOAD-HEX", "verify FD", "register FD NAME DATA-HEX".
   std::vector<std::string> events;
-  // The number of files that fopen opened, not counting integrity files.
+  // The number of calls of fopen, not counting those for integrity files.
   int other_fopens = 0;
-  // The attributes that were read: "FD NAME VALUE-IS-NULL SIZE".
+  // The attributes that were read: "FD NAME null SIZE", or "FD NAME buffer SIZE" if a buffer was
+  // passed.
   std::vector<std::string> attributes;
 };

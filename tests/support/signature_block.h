@@ -17,7 +17,7 @@ struct SignatureBlock {
   Digest digest = Digest::kSha256;
   // The key that issued the signer's certificate; empty: the signer's own.
   std::string issuer_key;
-  // The serial number that names the signer; unset: its certificate's.
+  // The serial number that names the signer; unset: the serial number of the signer's certificate.
   std::optional<Bytes> serial;
   // The signature covers authenticated attributes, which contain the digest of the signature file.
   bool authenticated_attributes = false;

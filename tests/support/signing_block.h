@@ -1,7 +1,8 @@
-// Writes, layer by layer, the block of the schemes after JAR signing (APK Signature Scheme v2, v3,
-// v3.1). It is between an archive's entries and its central directory. It protects the entries of
-// META-INF like all other entries. Numbers are little-endian. Every list and element has its length
-// as 32 bits before it.
+// Writes the APK signing block of the schemes that followed JAR signing (APK Signature Scheme v2,
+// v3, v3.1), with one function for each layer. The block is between an archive's entries and its
+// central directory. It protects the entries of META-INF like all other entries. Numbers are
+// little-endian. Every list and element has its length before it: 64 bits for a pair of the block,
+// and 32 bits for all others.
 #pragma once
 
 #include <cstdint>

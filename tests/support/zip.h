@@ -1,7 +1,7 @@
-// Writes ZIP archives, good ones and all kinds with false fields.
+// Writes ZIP archives, with true or with false fields.
 //
-// Every field that an item leaves unset gets its true value. A field that is set is written
-// unchanged, only in the place that it names.
+// Every field that an item leaves unset gets its true value, or 0 in a local header if a data
+// descriptor follows. A field that is set is written unchanged, only in the place that it names.
 #pragma once
 
 #include <cstdint>
@@ -32,7 +32,8 @@ struct ZipItem {
   ZipClaim local = {}, central = {}, descriptor = {};
 };
 
-// An item that claims this length in every place.
+// An item that claims this length in every place. If the item has a data descriptor, its local
+// header claims 0.
 ZipItem ClaimingLength(ZipItem item, uint32_t length);
 
 // The archive of the items, in order. Names may occur twice.

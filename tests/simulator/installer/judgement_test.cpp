@@ -10,7 +10,7 @@ namespace {
 
 std::string Hexadecimal(const Bytes& bytes) { return Hex(bytes); }
 
-// An answer with one range. The range has these members in place of good ones.
+// An answer with one range, whose members "verified", "signers" and "errors" have these values.
 std::string Answer(const std::string& verified, const std::string& signers,
                    const std::string& errors) {
   return R"({"ranges":[{"first":27,"last":2147483647,"verified":)" + verified +

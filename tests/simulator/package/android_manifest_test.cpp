@@ -29,8 +29,8 @@ std::optional<bool> Extracts(const std::vector<XmlAttribute>& attributes,
   return ParseAndroidManifest(xml.Build()).extracts_libraries;
 }
 
-// Makes every string of the pool the longest one. Together, the strings are then 40 times as long
-// as the document.
+// Makes every offset of the pool lead to the longest string. Together, the strings are then about
+// 90 times as long as the document: 203 strings of 5000 bytes, and a document of 11244 bytes.
 Bytes WithStringsInOneAnother(Bytes bytes) {
   constexpr size_t kPool = 8;          // after the document's header
   constexpr size_t kOffsets = 8 + 28;  // after the pool's header

@@ -217,7 +217,8 @@ TEST(PackageFacts, DamagedEntriesAreThereAllTheSame) {
   EXPECT_FALSE(facts.libraries[0].is_met);
 }
 
-// The order of the library decides which libraries come after the damage.
+// The zip library chooses the order of the entries, and so decides which libraries come after the
+// damage.
 TEST(PackageFacts, LibrariesBehindDamageAreNotMet) {
   PackageOptions options;
   for (int i = 0; i < 64; ++i) {

@@ -156,8 +156,8 @@ TEST(SignatureFile, SaysWhichOtherSchemesThereAre) {
   EXPECT_EQ(claimed("no signature file"), "");
 }
 
-// The first section with a digest of the manifest counts. If it has several, the tool's choice
-// counts.
+// The first section with a digest of the manifest counts. If this section has several such digests,
+// the one that the tool chooses counts.
 TEST(SignatureFile, MayHaveTheManifestsSha1Digest) {
   const auto has_sha1 = [](const std::string& text) {
     PackageOptions options;

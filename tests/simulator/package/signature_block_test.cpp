@@ -77,7 +77,8 @@ TEST(SignatureBlockFacts, DigestsThatTheToolDoesNotReadHaveTheirNames) {
   EXPECT_EQ(digest("1.2.3.4"), "1.2.3.4");
 }
 
-// RFC 4056 §3: the signature algorithm identifies RSASSA-PSS, and not the digest algorithm.
+// RFC 4056 §3: the field signatureAlgorithm identifies RSASSA-PSS. The field digestAlgorithm does
+// not.
 TEST(SignatureBlockFacts, SeeRsassaPss) {
   const auto has_pss = [](const std::string& digest, const std::string& algorithm) {
     SignatureBlock block;

@@ -123,7 +123,8 @@ TEST(KernelVerify, RefusesWithTheErrorOfThePhone) {
 }
 
 TEST(KernelFcntl, OtherCommandsGoToTheRealKernel) {
-  // The commands next to the feature's own, an unknown command, and commands with an argument.
+  // The commands next to the feature's own, an unknown command, a descriptor that is not open, and
+  // commands with an argument.
   const Lines commands = {"fcntl 3 1123 0",
                           "fcntl 3 1126 0",
                           "fcntl64 3 1123 0",

@@ -35,8 +35,8 @@ void SetBytes(const std::string& file, const char* bytes) {
   close(fd);
 }
 
-// Writes `bytes` and restores the mtime, so that only the ctime differs. chmod and a hidden change
-// have the same effect.
+// Writes `bytes` and restores the mtime, so that only the ctime differs. chmod also changes only
+// the ctime. A program can hide a change of the bytes in the same way.
 void ChangeTheInodeAlone(const std::string& file, const char* bytes) {
   struct stat before = {};
   ASSERT_EQ(stat(file.c_str(), &before), 0);

@@ -82,7 +82,7 @@ TEST(LogLine, OtherTextsAreUnknown) {
   }
 }
 
-// The author of a file chooses the names in it.
+// The author of a file chooses the names in it, so a name can contain the text of a log line.
 TEST(LogLine, TextInANameMakesNoOtherLine) {
   const LogLine path =
       ReadLogLine("OpenArchiveFd(3) [file: /a] returned: -6: x\n] returned: -3: Invalid file\n");

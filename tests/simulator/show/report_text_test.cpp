@@ -21,8 +21,8 @@ std::string Printed(const Report& report, const Look& look = kUtf8,
   return out.str();
 }
 
-// A report with items that are done, refused and without anything to sign. It has no signer and no
-// events.
+// A report with items that are done, that are refused, and that have nothing to sign. It has no
+// signer and no events.
 Report Example() {
   Report report;
   report.file = "base.apk";

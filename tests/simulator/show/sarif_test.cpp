@@ -146,8 +146,8 @@ TEST(Sarif, HostileTextsAreTexts) {
   EXPECT_EQ(message.find('\x1b'), std::string::npos);
 }
 
-// RFC 3986 §2.3 lists the characters that are not percent-encoded. §4.2 says why a colon must be
-// encoded.
+// RFC 3986 §2.3 lists the characters that need no percent-encoding. The "/" of a path is not
+// encoded either. §4.2 says why a colon must be encoded.
 TEST(UriOf, IsAReferenceWhateverTheName) {
   EXPECT_EQ(UriOf("base.apk"), "base.apk");
   EXPECT_EQ(UriOf("../a-b/c_d~e.apk"), "../a-b/c_d~e.apk");

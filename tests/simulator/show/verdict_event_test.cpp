@@ -199,8 +199,8 @@ TEST(VerdictEvent, EveryStateOfALinkHasACode) {
   EXPECT_EQ(chain[2]["state"], "not-reached");
 }
 
-// The key of the JAR signature is the one that the kernel got, even when the certificate shows
-// another.
+// The key of the JAR signature is the one that the kernel got, even if no certificate shows this
+// key.
 TEST(VerdictEvent, KeyThatNoCertificateShowsIsTold) {
   Report report;
   report.key = {"ab", 2048, true};

@@ -111,7 +111,7 @@ TEST(HeadFacts, HaveTheReasonInPlaceOfTheSigner) {
   EXPECT_EQ(HeadFacts(report, "..."), Lines({"libzu answered 7"}));
 }
 
-// The tool's other refusals are not the reason why phones do not install it.
+// The tool's other refusals are not the reason why phones do not install the package.
 TEST(HeadFacts, HaveTheInstallersReasonWhereTheVerdictIsHis) {
   Report report = WithSigner();
   report.verdict = Verdict::kNotInstallable;
@@ -170,7 +170,7 @@ TEST(SignerRows, SayOfTheKeyWhatTheKernelGot) {
                              "98302ce8 (of the modulus alone: what the kernel got)"));
   report.key->was_got = false;
   EXPECT_EQ(SignerRows(report)[5].second, "98302ce8 (of the modulus alone, as the tool reads it)");
-  // A certificate without a key that others can read is also shown, and so is a key without a
+  // A certificate is also shown if others cannot read its key. A key is also shown without a
   // certificate.
   report.signer->key = {"RSA", 0, "spki", ""};
   EXPECT_EQ(SignerRows(report).size(), 5U);

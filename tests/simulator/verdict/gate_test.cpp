@@ -98,7 +98,8 @@ TEST(ReadDigest, TakesNothingElse) {
   for (const std::string& text :
        {std::string(), digits, digits + "000", digits + "0", digits + "0g", digits + " 0",
         "0x" + digits, digits + "0\n", ":" + digits + "0", digits + ":00",
-        // These texts are as long as pairs with colons, but the colons are in other places.
+        // These texts are as long as 32 pairs with colons between them, but their colons are
+        // missing or in other places.
         std::string(64, '0') + std::string(31, ':'), std::string(95, '0'), std::string(95, ':')}) {
     EXPECT_EQ(ReadDigest(text), std::nullopt) << text;
   }

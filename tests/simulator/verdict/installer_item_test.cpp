@@ -113,7 +113,7 @@ TEST(OtherSigner, IsOneOfTheNewestScheme) {
   EXPECT_TRUE(is_other({{"v2", "other"}, {"v2", "own"}}));
 }
 
-// The newest phones that install it count.
+// The newest phones that install the package count.
 TEST(OtherSigner, IsTheOneOfTheNewestPhones) {
   Report report;
   report.signer = WithKey("own");

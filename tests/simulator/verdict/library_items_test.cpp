@@ -73,7 +73,8 @@ TEST(MakeReport, LibraryThatThePackageKeepsIsToldApart) {
             "lib/arm64/libfoo.so absent library-in-package");
 }
 
-// The tool's walk ends at the damaged entry. Later libraries are not signed, even if they are good.
+// The tool's iteration ends at the damaged entry. Later libraries are not signed, even if they are
+// good.
 TEST(MakeReport, LibraryBehindADamagedEntryIsRefusedIfItLiesThere) {
   const auto items = [](int error, bool is_strict) {
     PackageFacts facts =
@@ -141,8 +142,8 @@ TEST(MakeReport, LibrariesOfARefusedPackageFollowIt) {
   EXPECT_FALSE(report.items[0].is_verified);
 }
 
-// If the tool may not sign, it names no path. The order of the libraries then shows which library
-// it was.
+// If the tool may not sign a library, its log names no path. The order of the libraries then shows
+// which library the log is about.
 TEST(MakeReport, LibrariesThatTheKernelWasNotAskedForAreKnownByTheirOrder) {
   const PackageFacts facts = WithLibraries({"lib/arm64-v8a/liba.so", "lib/arm64-v8a/libb.so"});
   const Report report =

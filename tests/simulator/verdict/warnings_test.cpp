@@ -143,8 +143,8 @@ TEST(Warnings, OtherKeyOfAnyNewerSigner) {
   EXPECT_EQ(Warnings(facts), Lines({"other-key: the v2 " + told, "other-key: the v3 " + told}));
 }
 
-// The same modulus with another exponent is another key. The key of the certificate is also another
-// key if the kernel gets a different modulus.
+// The same modulus with another exponent is another key. The key that the JAR signer's certificate
+// shows is also another key if its modulus is not the one that the kernel gets.
 TEST(Warnings, OtherKeyWithAPartOfTheJarSigners) {
   PackageFacts facts = Good();
   facts.newer = {{"v2", CertificateWith("CN=other", kModulus, "other key")}};
