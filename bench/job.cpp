@@ -136,8 +136,8 @@ void ReadWhole(const std::string& path, Buffer& out) {
   close(fd);
 }
 
-// A workstation's kernel lacks the feature, so the request fails when the integrity file is
-// missing.
+// Logs the lines that the tool logs on a workstation. The kernel there has no integrity file, so
+// the tool sends no request.
 void AskKernel(int /*fd*/) {
   LogInfo("VeltSignOat: Apk case.\n");
   FILE* const integrity = fopen("/proc/self/integrity/value", "r");

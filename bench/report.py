@@ -84,7 +84,7 @@ def measure(package):
 
 
 def expect_same_log(package):
-    """Exits unless the three programs wrote the same log: then they did the same job."""
+    """Exits unless the three programs wrote the same log, which shows that they did the same job."""
     logs = {re.sub(r'\d\d-\d\d \d\d:\d\d:\d\d +\d+ +\d+', '', subprocess.run(
         [program, package_path(package.name)], check=True, capture_output=True, text=True).stderr)
         for program in (TOOL, FLOOR, PEER)}
@@ -139,7 +139,8 @@ def growth(runs, start_up):
 
 
 def measure_outside(package):
-    """The wall-clock seconds of the JDK's tools, which check every entry."""
+    """The wall-clock seconds of apksigner and jarsigner, which check every entry: the shorter of two
+    runs of each."""
     commands = (['apksigner', 'verify', '--min-sdk-version', '18', '--max-sdk-version', '23'],
                 ['jarsigner', '-verify'])
     times = []

@@ -8,7 +8,8 @@
 
 namespace {
 
-// Reads the elements of the range, one after the other, and the elements inside them.
+// Reads the elements of the range, one after the other, and the elements inside them, down to a
+// depth of 8.
 void WalkElements(const uint8_t* data, size_t size, int depth) {
   size_t position = 0;
   while (position < size) {
@@ -30,13 +31,13 @@ void WalkElements(const uint8_t* data, size_t size, int depth) {
 void CheckText(const asn1_oid& oid, size_t room) {
   std::vector<char> text(room, '?');
   asn1_oid_to_str(&oid, text.data(), room);
-  Require(room == 0 || text.back() == '\0', "the text ends in its buffer");
+  Require(room == 0 || text.back() == '\0', "the buffer ends with a NUL");
 }
 
 void ReadOid(const uint8_t* data, size_t size, size_t room) {
   asn1_oid oid;
   const int bare = asn1_parse_oid(data, size, &oid);
-  Require(oid.len <= 20, "no more than 20 arcs");
+  Require(oid.len <= 20, "at most 20 arcs");
   if (bare == 0) CheckText(oid, room);
 
   const uint8_t* next = nullptr;
@@ -52,7 +53,8 @@ void ReadBitString(const uint8_t* data, size_t size) {
   for (size_t bit = 0; bit < 32 && 1 + bit / 8 < size; ++bit) {
     if ((data[1 + bit / 8] >> (7 - bit % 8) & 1) != 0) expected |= uint64_t{1} << bit;
   }
-  Require(asn1_bit_string_to_long(data, size) == expected, "the bits come in their order");
+  Require(asn1_bit_string_to_long(data, size) == expected,
+          "bit n of the string is bit n of the value");
 }
 
 }  // namespace

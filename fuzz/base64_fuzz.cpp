@@ -1,5 +1,5 @@
-// apk/base64.h: decodes any text into a buffer of any size. A second decoder, which filters the
-// text first, must agree.
+// apk/base64.h: decodes any text into a buffer of any size. A second decoder, which first collects
+// all bits, must agree.
 #include "apk/base64.h"
 
 #include "fuzz/fuzz.h"
@@ -10,7 +10,7 @@ extern "C" int LLVMFuzzerTestOneInput(const uint8_t* data, size_t size) {
   const std::string text(reinterpret_cast<const char*>(data) + 1, size - 1);
   const std::optional<std::vector<uint8_t>> expected = ReadBase64(text);
   Require(Base64Decode(text) == (expected.value_or(std::vector<uint8_t>())),
-          "the text decodes to what it stands for");
+          "both decoders return the same bytes");
 
   const size_t room = data[0] % 64;
   std::vector<uint8_t> out(room);
@@ -18,11 +18,11 @@ extern "C" int LLVMFuzzerTestOneInput(const uint8_t* data, size_t size) {
   const int result = base64decode(text.data(), text.size(), out.data(), &length);
   Require(result == 0 || result == 1, "base64decode answers 0 or 1");
   if (result != 0) {
-    Require(length == room, "a failure leaves the length");
-    Require(!expected || expected->size() > room, "a failure has a reason");
+    Require(length == room, "a failure does not change the length");
+    Require(!expected || expected->size() > room, "a refused text is not base64 or does not fit");
     return 0;
   }
   out.resize(length);
-  Require(expected == out, "a text that fits has the same bytes");
+  Require(expected == out, "both decoders return the same bytes if they fit");
   return 0;
 }

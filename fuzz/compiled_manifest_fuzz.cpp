@@ -1,6 +1,7 @@
-// apk/android_manifest.cpp: any bytes as the compiled Android manifest. They are placed right
-// before memory that cannot be read, because the platform's parser is not instrumented. A second
-// reader converts every text to UTF-8 and then compares it. Both readers must find the same facts.
+// apk/android_manifest.cpp: any bytes as the compiled Android manifest. The tool's buffer for
+// them ends right before memory that cannot be read, because the platform's parser is not
+// instrumented. A second reader converts texts to UTF-8 before it compares them. Both readers must
+// find the same facts.
 #include <androidfw/ResourceTypes.h>
 #include <utils/String8.h>
 
@@ -20,8 +21,8 @@ struct Facts {
   bool asks = false;
 };
 
-// The conversion may drop UTF-16 units of a text. A text that is longer than the wanted one by more
-// than this many units is always a different text.
+// The conversion drops unpaired surrogates. As in the tool, a text does not match if it is longer
+// than the wanted text by more than this many UTF-16 units.
 constexpr size_t kMostDropped = 16;
 
 bool Is(const char16_t* text, size_t length, const std::string& wanted) {
@@ -71,7 +72,7 @@ void ReadElement(const ResXMLParser& parser, Facts* facts) {
   }
 }
 
-// Returns false if this reader, which reads every attribute, is too slow for the document.
+// Returns false if an element has so many attributes that this reader would be too slow.
 bool ReadByConversion(std::vector<uint8_t> bytes, Facts* facts) {
   const size_t size = bytes.size();
   bytes.resize(size + sizeof(android::ResXMLTree_attribute));
@@ -100,7 +101,7 @@ extern "C" int LLVMFuzzerTestOneInput(const uint8_t* data, size_t size) {
   }
   Facts facts;
   if (!ReadByConversion(bytes, &facts)) return 0;
-  Require(apk.GetPackageName() == facts.package_name, "the package's name is the converted one");
-  Require(apk.IsSsPermissionRequired() == facts.asks, "the permission is the converted one's");
+  Require(apk.GetPackageName() == facts.package_name, "both readers find the same package name");
+  Require(apk.IsSsPermissionRequired() == facts.asks, "both readers find the same permission");
   return 0;
 }

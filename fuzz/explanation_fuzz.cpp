@@ -1,5 +1,5 @@
-// The simulator's own readers of a file, which explain the tool's result: each reader alone, and
-// all of them over a whole file. The first byte selects the reader.
+// The simulator's own readers of a file, which explain the tool's result. The first byte of the
+// input selects one of four readers, or all of them over a whole file.
 #include <sys/mman.h>
 #include <unistd.h>
 
@@ -23,15 +23,17 @@ bool IsPartOf(std::string_view part, std::string_view whole) {
          (part.data() >= whole.data() && part.data() + part.size() <= whole.data() + whole.size());
 }
 
-// A certificate that was read has digests.
+// A certificate that parses has digests.
 void JudgeCertificate(std::string_view bytes) {
   const auto facts = ParseCertificate(bytes);
   ParseAlgorithm(bytes);
   if (!facts) return;
-  Require(facts->sha256.size() == 64 && facts->key.sha256.size() == 64, "digests of what is there");
+  Require(facts->sha256.size() == 64 && facts->key.sha256.size() == 64,
+          "the certificate and its key have digests");
   const bool has_modulus = !facts->key.modulus_sha256.empty();
-  Require(!has_modulus || facts->key.modulus_sha256.size() == 64, "the digest of a modulus");
-  Require(!has_modulus || facts->key.bits > 0, "the size of a key that reads");
+  Require(!has_modulus || facts->key.modulus_sha256.size() == 64,
+          "the modulus's digest has 64 digits");
+  Require(!has_modulus || facts->key.bits > 0, "a key with a modulus has a size");
 }
 
 void JudgeSigningBlock(std::string_view bytes) {
@@ -49,19 +51,21 @@ void JudgeSignatureBlock(std::string_view bytes) {
 void JudgeAndroidManifest(std::string_view bytes) {
   const AndroidManifest manifest = ParseAndroidManifest({bytes.begin(), bytes.end()});
   Require(!manifest.has_overlaps || !manifest.package_name, "overlapping texts are not read");
-  // A character of two bytes becomes at most three bytes.
-  Require(manifest.installer_name.size() <= bytes.size() * 3 / 2, "the name is in the document");
+  // A UTF-16 unit of two bytes becomes at most three bytes of UTF-8.
+  Require(manifest.installer_name.size() <= bytes.size() * 3 / 2,
+          "the installer's name fits in the document");
 }
 
 void ReadWholeFile(std::string_view bytes) {
   const int fd = memfd_create("package", MFD_CLOEXEC);
-  Require(write(fd, bytes.data(), bytes.size()) == static_cast<ssize_t>(bytes.size()), "the file");
+  Require(write(fd, bytes.data(), bytes.size()) == static_cast<ssize_t>(bytes.size()),
+          "the file is written");
   const PackageFacts facts = LookAt("/proc/self/fd/" + std::to_string(fd));
   close(fd);
   Require(facts.error == 0 && facts.size == bytes.size(), "the file is looked at");
   const bool is_archive = facts.kind == FileKind::kArchive && facts.archive_result == 0;
   Require(is_archive || facts.entries.empty(), "only archives have entries");
-  Require(!facts.was_changed, "nobody changed it");
+  Require(!facts.was_changed, "the file was not changed");
   size_t libraries = 0;
   for (const ListedEntry& each : facts.entries) libraries += kLibraryNames.Has(each.entry.name);
   Require(libraries == facts.libraries.size(), "each library is listed, damaged or not");

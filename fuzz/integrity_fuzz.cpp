@@ -1,4 +1,5 @@
-// sign/integrity.h: any text in the integrity file, on a phone whose last value is settled.
+// sign/integrity.h: any texts in the integrity file, one for each opening. The last text is a
+// settled value, so that every wait ends.
 #include "sign/integrity.h"
 
 #include <algorithm>
@@ -15,10 +16,11 @@ void CheckReading(const std::deque<std::string>& texts, uint32_t wait) {
   constexpr uint32_t kUntouched = 0x5a5a5a5a;
   uint32_t value = kUntouched;
   const uint32_t result = VeltTaskReadIntegrity(0, wait, &value);
-  Require(result == 0 || result == kVeltFailure, "the two codes");
-  Require(result != 0 || wait == 0 || value != 0xFFFFFFFF, "a waiting read ends settled");
+  Require(result == 0 || result == kVeltFailure, "the result is success or failure");
+  Require(result != 0 || wait == 0 || value != 0xFFFFFFFF,
+          "a waiting read returns a settled value");
   Require(result == 0 || wait != 0 || value == kUntouched, "a failed read leaves the value");
-  Require(phone.events.size() <= 2 * texts.size(), "no reading after the value has settled");
+  Require(phone.events.size() <= 2 * texts.size(), "the tool reads each text at most once");
 }
 
 bool MaySign(const std::deque<std::string>& texts) {
@@ -38,7 +40,7 @@ void CheckSigning(const std::deque<std::string>& texts) {
       std::any_of(phone.events.begin(), phone.events.end(),
                   [](const std::string& event) { return event.rfind("sign ", 0) == 0; });
   Require(told == is_signed, "a file is signed if and only if success is reported");
-  Require(told == may_sign, "a task signs when its value is settled and not 0");
+  Require(told == may_sign, "a task signs if and only if its settled value is not 0");
 }
 
 }  // namespace

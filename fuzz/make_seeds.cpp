@@ -175,7 +175,7 @@ void MakeCompiledManifests() {
 }
 
 // The first byte selects the phone. 0: a healthy phone. 2: the file has the attribute "user.zu".
-// 128: an attacker replaces libraries.
+// 16: the integrity value settles at the second reading. 128: an attacker replaces libraries.
 void SeedPackage(const std::string& name, const PackageOptions& options, uint8_t phone = 0) {
   Seed("package", name, Concat({{phone}, MakePackage(options).Build()}));
 }
@@ -235,7 +235,7 @@ void MakeJournals() {
 }
 
 // Numbers that choose the package and the events of its run (fuzz/verdict_fuzz.cpp). This package
-// has one key, is signed, and its key is registered.
+// has one key. It is signed, and its key is registered.
 void MakeVerdicts() {
   const Bytes package = {0, 1, 0, 1, 1, 0, 1, 0, 1, 0, 0, 1, 0};
   const Bytes run = {0, 0, 1, 1, 0, 1, 3, 1, 0, 1, 0, 0, 1, 2, 2, 0, 1};

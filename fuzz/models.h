@@ -1,5 +1,5 @@
 // Second parsers for the texts that the tool parses. The fuzz targets compare their results with
-// the tool's. They cut the text into pieces, while the tool reads it byte by byte.
+// the tool's. Their code differs from the tool's, so that the same fault is unlikely in both.
 #pragma once
 
 #include <cstdint>

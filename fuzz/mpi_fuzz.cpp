@@ -1,4 +1,5 @@
-// crypto/mpi.h: each operation on any operands, against GMP.
+// crypto/mpi.h: compares sums, differences, products, remainders, shifts and bit lengths of any
+// operands with those that GMP computes.
 #include "crypto/mpi.h"
 
 #include <gmp.h>
@@ -45,7 +46,8 @@ void RequireEqual(const mpi* number, Expected& expected, const char* what) {
   Require(actual == expected, what);
 }
 
-// Limbs that provoke errors of arithmetic: all bits set, no bits set, or a few bits set.
+// About half of the limbs have values that provoke errors of arithmetic, such as 0 and 0xffffffff.
+// The others may have any value.
 std::vector<uint32_t> Limbs(FuzzedDataProvider& input, size_t most) {
   constexpr uint32_t kEdges[] = {0, 1, 0xffffffff, 0x80000000, 0x7fffffff, 0xffff0000, 0x10000};
   std::vector<uint32_t> limbs(input.ConsumeIntegralInRange<size_t>(0, most));
@@ -97,7 +99,7 @@ void AddOrSubtract(FuzzedDataProvider& input) {
     Require(mpi_sub_abs(x, &a, second) == 0, "mpi_sub_abs");
   }
   RequireEqual(x, expected, "sums and differences");
-  Require(x->s == 1, "the sign of a magnitude");
+  Require(x->s == 1, "the sign of the result is +1");
 }
 
 void MultiplyByLimb(FuzzedDataProvider& input) {
@@ -136,7 +138,7 @@ void Remainder(FuzzedDataProvider& input) {
   mpi* const r = input.ConsumeBool() ? &other : &a;
   Expected divisor(&b), expected(&a);
   if (mpz_sgn(divisor.get()) == 0) {
-    Require(mpi_mod_mpi(r, &a, &b) == 18, "no division by zero");
+    Require(mpi_mod_mpi(r, &a, &b) == 18, "mpi_mod_mpi refuses zero");
     return;
   }
   mpz_mod(expected.get(), expected.get(), divisor.get());
@@ -167,7 +169,8 @@ void MontgomeryProduct(FuzzedDataProvider& input) {
   m.Set(modulus, 1);
   Expected expected_m(&m);
 
-  // The operands are below the modulus. The first has the extra limb that the product needs.
+  // The operands are below the modulus. The first operand has the extra limb that the product
+  // needs.
   SetBelow(a, Limbs(input, n), expected_m, n + 1);
   SetBelow(b, Limbs(input, n), expected_m, input.ConsumeBool() ? n + 1 : 1);
   t.Set(std::vector<uint32_t>(2 * (n + 1), 0x5a5a5a5a), 1);

@@ -1,6 +1,7 @@
 // Runs the whole tool, from main() on, with any bytes as the package file, on a phone inside this
 // program. The first byte of the input selects the phone. A model (package_model.h) reads the same
-// bytes and judges every signature and registration. Memory and descriptors are counted.
+// bytes and judges every signature and registration. The peak memory has a limit, and no descriptor
+// may stay open.
 #include <dirent.h>
 #include <fcntl.h>
 #include <sanitizer/allocator_interface.h>
@@ -38,7 +39,7 @@ constexpr size_t kBytesBesides = 1 << 20;
 
 std::vector<ZipArchiveHandle> open_archives;
 
-// The package's directory, in memory, with the libraries that an installer put there.
+// The package's directory, in memory, with libraries as an installer puts them there.
 class Installation {
  public:
   Installation() {
@@ -104,7 +105,7 @@ void Freed(const volatile void* block) {
 
 void Install() {
   static const bool installed = __sanitizer_install_malloc_and_free_hooks(Allocated, Freed) != 0;
-  Require(installed, "the memory is watched");
+  Require(installed, "the memory hooks are installed");
 }
 
 size_t LowestFreeDescriptor() {
@@ -141,7 +142,8 @@ class Judge {
   void JudgeSigning(int fd, const std::string& payload, bool is_package_file) {
     if (payload == "0000") {
       Require(!model_->is_package(), "the empty payload is for files that are not packages");
-      Require(is_package_file && phone_.verify_errno == 0, "and only for a file trusted already");
+      Require(is_package_file && phone_.verify_errno == 0,
+              "the empty payload is only for a trusted file itself");
       return;
     }
     Require(payload == "2000" + Hex(DigestOf(Digest::kSha256, model_->key())),
@@ -150,7 +152,7 @@ class Judge {
     if (is_package_file) return;
     const Bytes content = ContentOf(fd);
     Require(model_->AllowsLibrary(TheInstallation().directory(), PathOf(fd), content),
-            "a library is signed when its bytes are those of the manifest");
+            "only a library whose bytes match the manifest is signed");
   }
 
   void JudgeRegistration(const std::string& data, bool is_package_file) {
@@ -159,8 +161,8 @@ class Judge {
       Require(model_->is_good(), "nothing is registered for a package that is not good");
       Require(data == Hex(model_->key()), "a package registers its signer's key");
     } else {
-      Require(phone_.zu_attribute_size > 0, "a JAR is registered when it asks for it");
-      Require(data.size() == 256, "with a block of 128 bytes");
+      Require(phone_.zu_attribute_size > 0, "only a JAR with the attribute is registered");
+      Require(data.size() == 256, "a JAR is registered with 128 bytes");
     }
   }
 
@@ -251,7 +253,7 @@ extern "C" int LLVMFuzzerTestOneInput(const uint8_t* data, size_t size) {
   TheInstallation().PutBack();
   if (most_held > kBytesBesides) {
     Require(most_held <= kBytesBesides + kBytesPerByte * (size + DeclaredBytes(archive)),
-            "memory is bounded by what the file holds and declares");
+            "the peak memory is within its limit");
   }
   for (ZipArchiveHandle handle : open_archives) CloseArchive(handle);
   open_archives.clear();

@@ -31,7 +31,8 @@ struct PackageModel::Archive {
   Archive(const Archive&) = delete;
   Archive& operator=(const Archive&) = delete;
 
-  // Returns 1 if the archive has the entry, 0 if it does not, and -1 on any other error.
+  // Returns 1 if the archive has the entry, 0 if it does not or is not open, and -1 on any other
+  // error.
   int Find(const std::string& name, ZipEntry* entry) const {
     const int result = handle == nullptr ? -7 : FindEntry(handle, std::string_view(name), entry);
     return result == -7 ? 0 : result == 0 ? 1 : -1;

@@ -1,9 +1,8 @@
 // A model of the tool's decisions. The fuzz target for packages compares the tool's actions with
 // the model. The model reads the archive through the platform's zip library, as the tool does. It
-// reads texts with models.h, checks signatures with libcrypto, and compares digests. The tool's own
-// code finds two facts: the fields of the signature block (processCert), and the path at which a
-// library is installed. tests/crypto/pkcs7_test.cpp and tests/apk/native_libraries_test.cpp test
-// this code.
+// reads texts with models.h, and checks signatures and digests with libcrypto. The tool's own code
+// finds two facts: the fields of the signature block (processCert), and the path at which a library
+// is installed. tests/crypto/pkcs7_test.cpp and tests/apk/native_libraries_test.cpp test this code.
 #pragma once
 
 #include <map>
@@ -20,8 +19,8 @@ class PackageModel {
 
   // True if "AndroidManifest.xml" can be extracted from the archive.
   bool is_package() const { return is_package_; }
-  // True if the package is signed by `key`, and its manifest and classes.dex have the signed
-  // digests.
+  // True if the package is signed by `key`, its manifest and classes.dex (if there is one) have the
+  // signed digests, and "AndroidManifest.xml" is compiled XML.
   bool is_good() const { return is_good_; }
   const Bytes& key() const { return key_; }
   // True if one of the archive's libraries is installed at `path`, for a package in `directory`
@@ -39,7 +38,7 @@ class PackageModel {
   bool Judge(const Archive& archive);
   bool IsListed(const std::string& name, const Bytes& content) const;
   // True if the manifest has the digest that the signature file states. The first section with a
-  // manifest digest counts. If that section has several, its last one by name counts.
+  // manifest digest counts. If that section has several, the digest whose name sorts last counts.
   static bool StatesDigestOf(const Bytes& manifest, const ManifestModel& signature_file);
   static bool IsDigest(const std::string& attribute, const Bytes& digest, const Bytes& content);
 
@@ -50,6 +49,6 @@ class PackageModel {
   std::map<std::string, Listed> listed_;
 };
 
-// The sum of the sizes that the archive's entries declare. An entry is left out if deflate cannot
-// make the declared size from the entry's data.
+// The sum of the sizes that the archive's entries declare. "AndroidManifest.xml" counts 128 times.
+// An entry is left out if deflate cannot make the declared size from the entry's data.
 size_t DeclaredBytes(const Bytes& archive);

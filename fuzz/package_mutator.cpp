@@ -22,7 +22,8 @@ using Items = std::vector<ZipItem>;
 constexpr size_t kMostItems = 64;
 constexpr size_t kLongestItem = 1 << 16;
 
-// The entries in the order of their data; empty if the archive cannot be read.
+// The entries in the order of their data, without those that are too long or cannot be extracted.
+// Empty if the archive cannot be read.
 Items ReadItems(const Bytes& bytes) {
   ZipArchiveHandle archive = nullptr;
   void* cookie = nullptr;

@@ -1,6 +1,6 @@
-// Mutations of whole packages that get past the first check. Up to three changes are made to the
-// entries. Some of the digests and signatures over the entries are repaired. Then the archive is
-// built again.
+// Mutates whole packages so that many of them get past the first check. Up to three changes are
+// made to the entries. In most mutations, some digests and signatures are then repaired. At the
+// end, the archive is built again.
 #pragma once
 
 #include <cstddef>

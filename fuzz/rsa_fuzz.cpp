@@ -1,5 +1,5 @@
-// crypto/rsa.h: any key and signature. libcrypto also computes the encoded message. From this
-// message, the target computes the expected result.
+// crypto/rsa.h: any key and signature. libcrypto computes the encoded message from the signature,
+// and the target derives the expected result from this message.
 #include "crypto/rsa.h"
 
 #include <algorithm>
@@ -99,7 +99,7 @@ extern "C" int LLVMFuzzerTestOneInput(const uint8_t* data, size_t size) {
   for (int round = 0; round < 2; ++round) {
     Require(rsa_pkcs1_verify(&context, c.sha1.data(), sha256, c.md5.data(), c.signature.data()) ==
                 ExpectedAnswer(c),
-            "the answer that the encoded message deserves");
+            "the result is the model's");
   }
   return 0;
 }

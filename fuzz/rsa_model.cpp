@@ -21,7 +21,7 @@ Bytes PublicOperation(const Bytes& number, const Bytes& modulus, uint32_t expone
   Require(BN_set_word(e.get(), magnitude) &&
               BN_mod_exp_mont(result.get(), base.get(), e.get(), m.get(), context.get(), nullptr) &&
               BN_bn2bin_padded(bytes.data(), bytes.size(), result.get()),
-          "libcrypto computes");
+          "libcrypto computes the power");
   return bytes;
 }
 

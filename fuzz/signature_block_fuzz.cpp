@@ -1,5 +1,5 @@
-// crypto/pkcs7.h up to ApkTools::Apk::VerifyCertificate: any bytes as the signature block of one
-// fixed signature file. About half of the mutations are signed again.
+// crypto/pkcs7.h and ApkTools::Apk::VerifyCertificate: any bytes as the signature block of one
+// fixed signature file. About half of the mutations are signed again (SignAgain).
 #include <cstring>
 #include <random>
 
@@ -47,7 +47,8 @@ extern "C" int LLVMFuzzerTestOneInput(const uint8_t* data, size_t size) {
   Bytes key = untouched;
   const bool verified = apk.VerifyCertificate(block, sha1, sha256, md5, key);
   const Bytes expected = parsed == 0 ? VerifiedKey(record, block, SignatureFile()) : Bytes();
-  Require(verified == !expected.empty(), "verified when libcrypto verifies, and only then");
-  Require(key == (verified ? expected : untouched), "the key is the modulus");
+  Require(verified == !expected.empty(), "verified if and only if libcrypto verifies");
+  Require(key == (verified ? expected : untouched),
+          "the key is the modulus if verified, else unchanged");
   return 0;
 }

@@ -6,11 +6,13 @@
 #include "support/der.h"
 
 // Returns the signer's key if libcrypto's arithmetic finds both signatures of the block good.
-// Otherwise returns no bytes. The record points at the signed bytes, the key and the signatures,
-// which must be in the block. The exponent must not be 1 or -1, because anyone can forge signatures
-// for such a key.
+// Otherwise returns no bytes. The record points at the signed bytes, the key and the signatures.
+// The result is also empty if one of these is not in the block, if the key does not have 16 to 512
+// bytes, or if its exponent is 1 or -1. Anyone can forge signatures for such a key.
 Bytes VerifiedKey(const pkcs7& record, const Bytes& block, const Bytes& signature_file);
 
-// If the block is strict DER and its signer has no authenticated attributes, the record must equal
-// the one that a strict reader makes.
+// Requires that the record has the same signed bytes, signatures, modulus and exponent as a strict
+// DER reader finds. Checks nothing if that reader does not read the block, for example because the
+// signer has authenticated attributes. Checks neither the exponent nor the modulus if the exponent
+// is longer than the record's field.
 void CompareWithStrictReader(const pkcs7& record, const Bytes& block);

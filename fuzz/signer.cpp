@@ -42,7 +42,8 @@ Bytes Sign(const Bytes& data, const BIGNUM* private_exponent, size_t size) {
   return signature;
 }
 
-// Copies `piece` to `place`, a position in the block. Returns false if it does not fit there.
+// Copies `piece` to `place`, a position in the block. Returns false if the piece does not fit
+// there.
 bool Put(const Bytes& piece, const uint8_t* place, Bytes& block) {
   if (!LiesIn(place, piece.size(), block.data(), block.size())) return false;
   std::copy(piece.begin(), piece.end(), block.begin() + (place - block.data()));

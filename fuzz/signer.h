@@ -6,18 +6,18 @@
 
 #include "support/der.h"
 
-// The test key of all seeds. It is the smallest test key that is long enough for an encoded
+// The test key of most seeds. It is the smallest test key, and just long enough for an encoded
 // message.
 inline constexpr char kFuzzKey[] = "rsa-512";
 
 // Writes good signatures into the signature block: the certificate's signature, and the signer's
-// signature over the signature file. The block keeps its length and all other bytes. Does nothing
-// if the block does not parse, if its modulus is not the fuzz key's, if its exponent has no
-// inverse, or if a signature does not fit.
+// signature over the signature file. The block keeps its length and all other bytes. Leaves out a
+// signature that does not fit. Does nothing if the block does not parse, if its modulus is not the
+// fuzz key's, or if its exponent has no inverse.
 void SignAgain(Bytes& block, const Bytes& signature_file);
 
 // Writes the correct digests into the text. The length of the text does not change. Replaces each
 // "SHA1-Digest" and "SHA-256-Digest" (followed by `suffix`) in the section that names `name` by the
-// data's digest. An empty `name` means every section.
+// data's digest. An empty `name` means the whole text.
 void DigestAgain(std::string& text, const std::string& name, const std::string& suffix,
                  const Bytes& data);

@@ -1,7 +1,7 @@
-// Compares the verdict on an invented run of an invented package with the kernel's calls and
-// answers. If the verdict says that the kernel got a key, the kernel must have got this key. The
-// verdict must call a thing signed only if the kernel signed it, and must report every failure. The
-// shown text must agree with the verdict.
+// Compares the verdict on an invented run of an invented package with the calls to the kernel and
+// its answers. If the verdict says that the kernel got a key, the kernel must have got this key.
+// The verdict must not name more signed things than the kernel signed, and must report every
+// failure. The shown text must agree with the verdict.
 #include <algorithm>
 #include <sstream>
 #include <string>
@@ -161,13 +161,15 @@ bool HasWarning(const Report& report, const Cause& cause) {
 }
 
 void JudgeKey(const Run& run, const PackageFacts& facts, const Report& report) {
-  Require(report.payload.empty() || IsGranted(run, report.payload), "the kernel's payload");
+  Require(report.payload.empty() || IsGranted(run, report.payload),
+          "the kernel got the reported payload");
   if (!report.key) return;
   const std::string& key = report.key->sha256;
   if (report.key->was_got) {
     Require(IsGranted(run, "2000" + key), "the kernel got this key");
   } else {
-    Require(facts.jar.key && facts.jar.key->modulus_sha256 == key, "the tool reads this key");
+    Require(facts.jar.key && facts.jar.key->modulus_sha256 == key,
+            "the reported key is the tool's");
   }
   const auto& shown = facts.jar.certificate;
   const bool is_other = shown && shown->key.modulus_sha256 != key;
@@ -190,9 +192,9 @@ void JudgeItems(const Run& run, const Report& report) {
     if (item.kind != ItemKind::kKey) ++done;
     const auto& names = run.registered;
     const bool is_registered = std::find(names.begin(), names.end(), item.name) != names.end();
-    Require(item.kind != ItemKind::kKey || is_registered, "libzu took this key");
+    Require(item.kind != ItemKind::kKey || is_registered, "libzu accepted this key");
   }
-  Require(done <= run.granted.size(), "each thing signed was signed by the kernel");
+  Require(done <= run.granted.size(), "at most as many items as the kernel signed");
 }
 
 void JudgeVerdict(const Run& run, const PackageFacts& facts, const Report& report) {
@@ -205,10 +207,10 @@ void JudgeVerdict(const Run& run, const PackageFacts& facts, const Report& repor
   Require(!is_good || !is_refused, "a refused item is reported");
   Require(!is_good || report.items[0].state == ItemState::kDone, "the file itself was signed");
   Require(report.verdict == Verdict::kNotSimulated || !facts.was_changed,
-          "a changed file has no result");
+          "a changed file is not simulated");
 }
 
-// The verdict's line names the right key, and no warning contradicts it.
+// The printed text and the verdict event must agree with the report.
 void JudgeShown(const Report& report) {
   std::ostringstream line, all;
   PrintReport(report, Detail::kVerdict, Look(), line);
@@ -225,7 +227,8 @@ void JudgeShown(const Report& report) {
   Require(is_got == (report.key && report.key->was_got),
           "a key is called the kernel's only if the kernel got it");
   const bool is_alarmed = HasWarning(report, cause::kCertificateOtherKey);
-  Require(!is_alarmed || head.find("   ! ") != std::string::npos, "an alarm is in the line");
+  Require(!is_alarmed || head.find("   ! ") != std::string::npos,
+          "an alarm is in the verdict's line");
 
   const json event = json::parse(VerdictEvent(report));
   Require(event["payload"] == report.payload, "the event has the payload");

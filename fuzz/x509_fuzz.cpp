@@ -1,5 +1,5 @@
 // crypto/x509.h: any bytes as a certificate. If the platform's libcrypto reads the certificate as
-// well, both must find the fields in the same places.
+// well, both must find the same signed bytes, public key and signature.
 #include "crypto/x509.h"
 
 #include <openssl/mem.h>
@@ -17,7 +17,7 @@ struct FreeX509 {
 };
 
 void CheckName(const x509_name& name, const uint8_t* data, size_t size) {
-  Require(name.attribute_count <= 20, "no more than 20 attributes");
+  Require(name.attribute_count <= 20, "at most 20 attributes");
   for (uint64_t i = 0; i < name.attribute_count; ++i) {
     const x509_name_attribute& attribute = name.attributes[i];
     Require(attribute.type >= 1 && attribute.type <= 8, "an attribute is of a known kind");
@@ -35,7 +35,7 @@ void CheckName(const x509_name& name, const uint8_t* data, size_t size) {
 }
 
 void CheckRecord(const x509_certificate& record, const uint8_t* data, size_t size) {
-  Require(record.next == nullptr, "the parser chains nothing");
+  Require(record.next == nullptr, "the record has no next record");
   Require(record.version <= 2, "version");
   Require(LiesIn(record.cert_start, record.cert_length, data, size), "certificate");
   Require(LiesIn(record.tbs_start, record.tbs_length, record.cert_start, record.cert_length),
@@ -80,7 +80,7 @@ void CompareWithLibcrypto(const x509_certificate& record) {
 extern "C" int LLVMFuzzerTestOneInput(const uint8_t* data, size_t size) {
   x509_certificate record;
   const int result = x509_certificate_parse(data, size, &record);
-  Require(result <= 0 && result >= -15, "a known code");
+  Require(result <= 0 && result >= -15, "the result is a known code");
   if (result != 0) return 0;
   CheckRecord(record, data, size);
   CompareWithLibcrypto(record);

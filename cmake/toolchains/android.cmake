@@ -11,7 +11,8 @@ if(NOT CMAKE_SYSROOT)
   message(FATAL_ERROR "The android preset needs -DCMAKE_SYSROOT=DIR, see docs/porting.md")
 endif()
 set(CMAKE_TRY_COMPILE_PLATFORM_VARIABLES CMAKE_SYSROOT)
-# A sysroot may have the libraries but lack the start files of programs.
+# A sysroot may lack the start files of programs, so CMake must check the compiler without linking a
+# program.
 set(CMAKE_TRY_COMPILE_TARGET_TYPE STATIC_LIBRARY)
 
 if(NOT CMAKE_CXX_COMPILER)

@@ -5,8 +5,9 @@ in the simulated phone, and prints a table.
 FILES has the files of the runs, EXPECTED the simulator's journals. Each directory KERNEL has
 `results`, as tests/kernel/init left them, and `disk.img`. Fails if anything differs: an event (log
 record, reading of the integrity value, call to the kernel with payload, result and errno,
-registration, exit status), its place in the order, or a line of output. Also fails if a signed file
-on the disk does not keep its payload, or if the kernel complained.
+registration, exit status), its place in the order, a line of output, or a result of the probe. Also
+fails if a signed file on the disk does not keep its payload and its digest, if the tool's domain was
+not entered once per confined run, or if the kernel complained.
 """
 
 import difflib
@@ -70,7 +71,7 @@ class Kernel:
 
 
 def simulated(expected, run):
-    """The simulated phone's events without the output, and the output."""
+    """The simulated phone's events that a run on a real kernel shows as well, and the output."""
     lines = (expected / f"{run.name}.journal").read_text().splitlines()
     events = [json.loads(line) for line in lines]
     output = "".join(event["text"] for event in events if event["event"] == "stdout")
@@ -111,7 +112,8 @@ def last_payloads(kernel, all_runs):
 
 def check_disk(kernel, files, all_runs):
     """Checks that the disk keeps the digest and the payload of each signed file. e2fsprogs reads
-    both. Returns the number of signed files."""
+    both. A run changes changed.jar after it was signed, so its digest must differ from the file's.
+    Returns the number of signed files."""
     payloads = last_payloads(kernel, all_runs)
     with tempfile.TemporaryDirectory() as name:
         directory = pathlib.Path(name)
@@ -135,7 +137,7 @@ def check_disk(kernel, files, all_runs):
 
 
 def check_domain(kernel, all_runs):
-    """With a policy, checks that each confined run was in the tool's domain."""
+    """With a policy, checks that the tool's domain was entered once per confined run."""
     entered = sum(bool(ENTRY.search(line)) for line in kernel.messages)
     confined = sum(run.confined for run in all_runs)
     if kernel.has_policy and entered != confined:

@@ -2,7 +2,7 @@
 """The runs on the real kernel and in the simulated phone, for scripts/kernel.
 
 runs.py files DIRECTORY GOLDEN           makes the files for the runs
-runs.py simulate DIRECTORY BUILD OUT     runs all in the simulated phone, with the journals OUT/NAME.journal.
+runs.py simulate DIRECTORY BUILD OUT     simulates all runs, with the journals OUT/NAME.journal.
                                          Writes the same runs as a script for the guest: OUT/runs
 """
 
@@ -18,8 +18,8 @@ TOOL, VERIFY, PROBE = "apktoolkit", "apktoolkit-verify", "simulator_probe"
 
 GOOD = "golden/apksigner-sha256-2048"
 
-# The probe's calls (tests/simulator/phone/probe.cpp). The tool never makes them, but the simulated
-# kernel must answer them like a real one.
+# The probe's calls (tests/simulator/phone/probe.cpp). The tool makes only a few of them, but the
+# simulated kernel must answer all of them like a real one.
 PROBES = {
     # A product's kernel trusts the JARs of its system. Here the probe signs the JARs first, so that
     # the kernel trusts them.
@@ -34,7 +34,7 @@ PROBES = {
               # descriptors that are not open, or that only name a file (O_PATH)
               "sign 700 0000", "sign -1 0000", "sign 700 null", "verify 700", "verify -1",
               "name .", "sign 5 0000", "verify 5",
-              # the commands beside the feature's own
+              # other commands than the feature's own
               "fcntl 3 1123 0", "fcntl 3 1126 0", "fcntl64 3 99999 0", "fcntl 700 1126 0", "fcntl 3 1 0",
               # the integrity files, which can only be read
               "fopen /proc/self/integrity/value r", "fopen64 /proc/self/integrity/value r",

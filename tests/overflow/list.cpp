@@ -1,5 +1,5 @@
 // Lists a manifest whose sections are not sorted, and finds one section. With the argument "hash",
-// uses the C++ library's hash instead, which must be trapped.
+// computes the C++ library's hash of the text instead, which must be trapped.
 #include <cstdio>
 #include <functional>
 #include <string>

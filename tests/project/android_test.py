@@ -9,7 +9,8 @@ import tempfile
 
 from sources import ROOT, report
 
-# Later functions: a call of each, and its linker name.
+# Functions of later API levels. Each declaration has the name that scripts/android prints, and a
+# call.
 LATER = {
     "int memfd_create(const char*, unsigned);": ("memfd_create", 'memfd_create("", 0)'),
     "long getrandom(void*, unsigned long, unsigned);": ("getrandom", "getrandom(0, 0, 0)"),

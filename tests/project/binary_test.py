@@ -25,7 +25,7 @@ int main(int count, char** words) {
 GOOD = {"bind": "-Wl,-z,now", "table": "-Wl,-z,relro", "place": "-pie -fPIE",
         "stack": "-fstack-protector-strong", "calls": "-D_FORTIFY_SOURCE=2", "heap": "-O2"}
 
-# A part, the flag that removes it, and the message about this.
+# A part, the flags that remove it, and the message for a program without it.
 BAD = [("bind", "-Wl,-z,lazy", "binds its symbols when they are called"),
        ("table", "-Wl,-z,norelro", "is writable"),
        ("place", "-no-pie -fno-pie", "is not position-independent"),

@@ -44,9 +44,9 @@ KNOWN_PROPERTIES = {"cflags", "compile_multilib", "cpp_std", "data", "defaults",
 PLATFORM_ONLY_FLAGS = {"-Wno-sign-conversion", "-Werror"}
 
 
-# By blueprint: the modules whose sources come from targets of CMake, with these targets. A target
-# is DIRECTORY:NAME, or NAME in the root. In a blueprint, paths are relative to the blueprint's
-# directory.
+# For each blueprint, the modules whose sources come from targets of CMake, with these targets. A
+# target is DIRECTORY:NAME, or NAME in the root. In a blueprint, paths are relative to the
+# blueprint's directory.
 MODULES = {
     "Android.bp": {"apktoolkit_core": ["apktoolkit_core"], "apktoolkit": ["apktoolkit"],
                    "apktoolkit-verify": ["apktoolkit-verify"],

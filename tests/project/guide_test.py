@@ -1,9 +1,9 @@
 #!/usr/bin/env python3
 """Runs the commands that docs/guide.md shows, and writes their output to the page.
 
-Arguments: the directory of the golden packages, and the words that start apktoolkit-sim. A last
-line of three dots on the page stands for the lines that follow. A command may print anything if the
-page shows only this line.
+Arguments: the directory of the golden packages, and the command line that starts apktoolkit-sim. A
+last line of three dots on the page stands for the lines that follow. A command may print anything
+if the page shows only this line.
 """
 
 import pathlib
@@ -53,7 +53,7 @@ def settled(lines):
 
 
 def checked(block, shell):
-    """The block with the output that its commands have now."""
+    """Returns the block with the current output of its commands."""
     lines = []
     for command, expected in shown_commands(block):
         shown = shell.run(command).stdout.replace(str(shell.directory), DIRECTORY).splitlines()

@@ -1,7 +1,7 @@
 #!/usr/bin/env python3
-"""Runs every command that makes a key in README.md, in docs/guide.md and on the manual page. Each
-certificate must be signed with SHA-256. The pages also name the default algorithms of some JDKs.
-They are compared with those of the installed JDK, if it is one of these JDKs."""
+"""Runs the keytool commands that README.md, docs/guide.md and the manual page show. The certificate
+that each command makes must be signed with SHA-256. The pages also name the default algorithms of
+some JDKs. If the installed JDK is one of these JDKs, it must use these algorithms."""
 
 import re
 import subprocess

@@ -30,8 +30,8 @@ def prepare(directory, build, package):
 
 
 def run(commands, directory, compiler):
-    """Returns the output of each command, and the problems. Runs all in one shell, until one
-    fails."""
+    """Runs the commands in one shell, until one fails. Returns the output of each command, and the
+    problems."""
     script = "set -euo pipefail\n" + "\n".join(f"echo '{MARK}'; {command}" for command in commands)
     environment = {**os.environ, "HOME": str(directory), "CXX": compiler}
     result = subprocess.run(["bash", "-c", script], cwd=directory, env=environment, text=True,
@@ -43,7 +43,8 @@ def run(commands, directory, compiler):
 
 
 def page_problems(directory, compiler):
-    # The first command is left out: it makes a build tree, and this test has the tested one.
+    # The first command makes a build tree. It is left out, because this test uses the build tree
+    # that it was given.
     blocks = re.findall(r"^```\n(\$ .*?)\n```$", (ROOT / "examples/README.md").read_text(), re.M | re.S)
     shown = [command for block in blocks for command in shown_commands(block)][1:]
     printed, problems = run([command for command, _ in shown], directory, compiler)

@@ -18,8 +18,8 @@ LINK = re.compile(r"\]\(([^)#:]+)(?:#[^)]*)?\)")
 
 PAGE = ROOT / "docs/architecture.md"
 PATH = r"\w[\w/]*/\w+\.(?:cpp|h|md|py)"
-# The places where the page names a function and its file: a stop of the picture, a row of the
-# table, an answer.
+# The page names a function and its file in three places: a stop of the picture, a row of the table,
+# and an answer.
 STOP = re.compile(rf"^[ |:v]*([\w:]+) +({PATH})", re.M)
 ROW = re.compile(rf"^\|[^|]*\| ([^|]*) \| ((?:`{PATH}`(?:, )?)+) \|$", re.M)
 ANSWER = re.compile(rf"`([\w:]+)`\s+in\s+`({PATH})`")

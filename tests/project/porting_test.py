@@ -1,7 +1,8 @@
 #!/usr/bin/env python3
 """Compares docs/porting.md with the sources: the interface, the modules of the blueprint, the
-example of a JAR's key block, and the links to all directories of integration/. From the sources,
-writes the directories of installed libraries to docs/porting.md and to the tool's manual page."""
+example of a JAR's key block, the links to the page's own headings, and the links to all directories
+of integration/. Writes the directories of installed libraries, as apk/native_libraries.h has them,
+to docs/porting.md and to the tool's manual page."""
 
 import hashlib
 import re
@@ -20,7 +21,7 @@ def section(title):
     return re.search(rf"^#+ {re.escape(title)}\n(.*?)(?=^#)", PAGE, re.M | re.S)[1]
 
 
-# A fact in the sources, and how the page says it.
+# A fact in the sources, and the text in which the page states it.
 INTERFACE = (
     ("sign/integrity.cpp", r"kSignCommand = (\d+);", "### fcntl(fd, {}, payload): sign\n"),
     ("sign/integrity.cpp", r"kVerifyCommand = (\d+);", "### fcntl(fd, {}): verify\n"),
@@ -49,7 +50,7 @@ def key_block_problems():
 
 
 def module_problems():
-    """The table of modules has all modules of the blueprint that a product may name."""
+    """The table of modules must have exactly the modules of the blueprint, without cc_defaults."""
     named = set(re.findall(r"^\| `(\w[\w-]*)` \|", section("In a platform tree"), re.M))
     built = {module["name"] for module in Blueprint(ROOT / "Android.bp").modules
              if module["type"] != "cc_defaults"}

@@ -1,14 +1,14 @@
 #!/usr/bin/env python3
-"""Reads the JUnit reports and SARIF logs of real runs, also of files with odd names.
+"""Reads the JUnit reports and SARIF logs of real runs. Some of the files have odd names.
 
-Arguments: the directory of the golden packages, and the words that start apktoolkit-sim.
+Arguments: the directory of the golden packages, and the command line that starts apktoolkit-sim.
 
 junitparser reads the JUnit reports. A SARIF log is checked with the schema SARIF below. The schema
-has the objects and properties of the standard (OASIS, SARIF 2.1.0) that the simulator writes. It
-has the constraints of their sections: types, required properties, enumerated values, minimum
-values, and unique items. Any other property is an error, so that the simulator writes no unchecked
-property. A schema cannot express all rules; the test itself checks the indices (§3.4.5, §3.52.4)
-and the URIs (§3.4.3).
+has those objects and properties of the standard (OASIS, SARIF 2.1.0) that the simulator writes. The
+schema has the standard's constraints on them: types, required properties, enumerated values,
+minimum values, and unique items. Any other property is an error, so that the simulator writes no
+unchecked property. A schema cannot express all rules; the test itself checks the indices (§3.4.5,
+§3.52.4) and the URIs (§3.4.3).
 """
 
 import json
@@ -26,7 +26,7 @@ import junitparser
 from messages_test import causes
 from sources import report
 
-# The codes of refusals that follow from another one.
+# The codes of refusals that follow from another refusal.
 FOLLOWING = {row["code"] for row in causes() if row["severity"] == "kFollows"}
 
 
@@ -74,8 +74,10 @@ def run(simulator, directory, options, files):
 
 
 def junit_problems(verdicts, suites):
-    """Checks that each file has a case. The case passes with status 0, fails with status 1, and
-    otherwise is an error."""
+    """Checks that each file has a case, and that the totals are right. The case of a file must pass
+    for status 0, fail for status 1, and be an error for any other status. The type of
+    a failure or error must be the reason of the first item, if this item is refused and the status
+    is not 3."""
     cases = [case for suite in suites for case in suite]
     problems = [] if len(cases) == len(verdicts) else [f"{len(verdicts)} files, {len(cases)} cases"]
     for verdict, case in zip(verdicts, cases):

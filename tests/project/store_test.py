@@ -1,8 +1,9 @@
 #!/usr/bin/env python3
 """Runs the commands of docs/store.md over a few hundred packages on this machine. Kills all of the
-work in the middle, and continues it. No result may be lost, and none may be there twice.
+work in the middle, and continues it. No result may be lost, and none may be there twice. A journal
+that was cut off must not count as a result.
 
-Arguments: the directory of the golden packages, and the words that start apktoolkit-sim.
+Arguments: the directory of the golden packages, and the command line that starts apktoolkit-sim.
 """
 
 import json
@@ -95,7 +96,7 @@ def kill_session(leader):
 
 
 def run_and_kill(shell, command):
-    """Kills the work after some lists are done. Returns the problems."""
+    """Runs the command, and kills its work when at least 4 lists are done. Returns problems."""
     process = shell.start(command)
     while process.poll() is None and len(shell.journals()) < 4:
         time.sleep(0.05)

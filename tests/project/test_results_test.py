@@ -1,6 +1,7 @@
 #!/usr/bin/env python3
-"""Runs scripts/test-results on files as ctest writes them: with passed, skipped and failed tests,
-and with a test that could not be started."""
+"""Runs scripts/test-results on files as ctest writes them: with passed, skipped, disabled and
+failed tests, with a test that timed out, with a test that could not be started, and without
+tests."""
 
 import subprocess
 import sys

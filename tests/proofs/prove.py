@@ -1,6 +1,6 @@
 #!/usr/bin/python3
-"""Proves, for all inputs, the claims in the comments of the tool's arithmetic (z3). Reads the
-functions from the sources. Fails if a claim does not hold."""
+"""Proves claims about functions of crypto/ and apk/ for all inputs, with z3 or by trying cases that
+stand for all others. Reads the functions from the sources. Fails if a claim does not hold."""
 import re
 import sys
 import tempfile
@@ -65,7 +65,7 @@ def half_digit_is_quotient_and_remainder():
     high, low = d >> 16, d & HALF
     # rest = estimate * high + left; `taken` and `to_take` are the products of the estimate with the
     # halves of d. `rest` is below (2^16 + 2) * high, so the estimate is below 2^16 + 2, and
-    # the second product fits in a limb.
+    # `to_take` fits in a limb.
     estimate, left, taken, to_take = word("estimate"), word("left"), word("taken"), word("to_take")
     always(given, z3.UGT(wide(high) * (HALF + 3), wide(rest)))
     given += [z3.ULE(estimate.term, HALF + 2), z3.ULT(left.term, high.term),
@@ -86,7 +86,8 @@ def half_digit_is_quotient_and_remainder():
         return function(place, half, d), place[0]
 
     Word.quotient, Word.product = quotient, product
-    # The dividend is rest * 2^16 + next. Minus estimate * d, it is left * 2^16 + next - to_take.
+    # The dividend is rest * 2^16 + next. The dividend minus estimate * d is left * 2^16 + next -
+    # to_take.
     difference = (wide(left) << 16) + wide(half) - wide(to_take)
     for holds, (digit, remainder) in Runs(run, given):
         less = wide(estimate) - wide(digit)
@@ -106,7 +107,7 @@ def plain_text_is_eight_bytes_above_the_line_ends():
 
 
 class Power:
-    """A power of one number, by its exponent: a product adds the exponents."""
+    """A power of a number. Only its exponent is kept, because a product adds the exponents."""
 
     def __init__(self, exponent):
         self.exponent = exponent

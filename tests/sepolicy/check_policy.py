@@ -1,7 +1,7 @@
 #!/usr/bin/env python3
 """Compiles integration/sepolicy with stand-ins for the platform's policy, for every supported kind
-of release. Compares the permissions that it grants with the list below: it must grant exactly
-these.
+of release. The policy must grant exactly the permissions that are listed below, and file_contexts
+must be valid and match each program of the kit once.
 
 m4, checkpolicy, secilc and setfiles are Debian's. The compilation must fail with each rule of
 REFUSED.
@@ -157,7 +157,7 @@ def check(directory, level):
 
 
 def check_names():
-    """Every program of the kit has a label, and every label belongs to a program."""
+    """Checks that each program of the kit matches exactly one pattern of file_contexts."""
     programs = {"apktoolkit", "apktoolkit-all", "apktoolkit-bound", "apktoolkit-verify"}
     patterns = [line.split()[0] for line in (KIT / "file_contexts").read_text().splitlines()
                 if line and not line.startswith("#")]

@@ -27,8 +27,8 @@ Bytes WithForgedBlock(const Bytes& exponent) {
   return ToBytes(ContentOf(apk));
 }
 
-// All forms of bytes that are read as the exponents 1 and -1. Bytes 5 to 8 set the length of the
-// modulus, and must keep it at 256: 00 01 00 00 in host byte order.
+// Bytes of different lengths that are read as the exponents 1 and -1. Bytes 5 to 8 overwrite the
+// length of the modulus, and must keep it at 256: 00 01 00 00 in host byte order.
 TEST(Threat, AnExponentOfOneIsRefusedInEveryForm) {
   for (const char* exponent :
        {"01", "01 00", "01 00 00", "01 00 00 00", "FF FF FF FF", "01 00 00 00 00 01",
@@ -41,7 +41,7 @@ TEST(Threat, AnExponentOfOneIsRefusedInEveryForm) {
   }
 }
 
-// These exponents reach the check of the signature, and fail there.
+// These exponents reach the check of the certificate's signature, which fails.
 TEST(Threat, AnyOtherExponentAsksForThePrivateKey) {
   for (const char* exponent : {"00", "02", "03", "11", "7F", "01 00 01", "01 01", "00 01", "02 00",
                                "FE FF FF FF", "FF FF FF 7F", "FF FF FF", "FF", "00 00 00 01"}) {
@@ -133,7 +133,7 @@ TEST_F(ExchangedLibrary, WrittenToIsRefused) {
   });
 }
 
-// A program can set the times of a file, but not its ctime.
+// A program can set a file's atime and mtime, but not its ctime.
 TEST_F(ExchangedLibrary, WrittenToWithItsTimeSetBackIsRefused) {
   ExpectRefused([this] {
     struct stat before;

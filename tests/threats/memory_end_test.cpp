@@ -12,8 +12,8 @@
 namespace {
 
 // Parses the document at the end of memory, in the block that the tool allocates for it. The block
-// is longer than the document by 20 bytes. A missing attribute (20 bytes) or chunk header (8 bytes)
-// fits in them.
+// is 20 bytes longer than the document. A missing attribute (20 bytes) or chunk header (8 bytes)
+// fits in these 20 bytes.
 bool ParseAtMemoryEnd(ApkTools::Apk* apk, const Bytes& document) {
   PutNextBlockAtMemoryEnd(document.size() + 20);
   const bool parsed = apk->ParseAndroidManifest(document);

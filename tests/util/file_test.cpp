@@ -158,7 +158,7 @@ TEST_F(ReadFileTest, FileThatCannotBeRewoundHasNoSize) {
   ExpectNoSize(MakeFile("abc"));
 }
 
-// Like a file that grows or shrinks between the two calls.
+// The results are those for a file that grows or shrinks between fstat and lseek.
 TEST_F(ReadFileTest, SizeIsTheFilesEndAndNotTheStatesSize) {
   for (const off_t end : {off_t{2}, off_t{5}}) {
     kernel.lseek = [end](int whence) { return whence == SEEK_END ? end : off_t{0}; };

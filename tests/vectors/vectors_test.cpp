@@ -22,10 +22,10 @@ namespace {
 
 using nlohmann::json;
 
-// Flags of vectors where the tool's rules differ. The first is the project's own: these vectors are
-// invalid by the standard and accepted on purpose. The second is Wycheproof's: the signature is
-// made with another digest than the key is for. The tool accepts any digest that it knows, because
-// the signature itself names its digest.
+// Flags of vectors whose result may differ from the tool's verdict. The first is the project's own:
+// these vectors are invalid by the standard and accepted on purpose. The second is Wycheproof's:
+// the signature is made with another digest than the key is for. The tool accepts any digest that
+// it knows, because the signature itself names its digest.
 constexpr char kAcceptedShortPadding[] = "AcceptedShortPadding";
 constexpr char kWrongHash[] = "WrongHash";
 
