@@ -81,16 +81,20 @@ bool AskKernel(int fd) {
   return true;
 }
 
-// A path may contain any byte except NUL. The control characters of ASCII and the backslash are
-// printed as \xHH, so that a path cannot end the line or send ESC to a terminal.
+// A path may contain any byte except NUL. Control characters and the backslash are printed as \xHH,
+// so that a path cannot end the line or control a terminal. The control characters are those of
+// ASCII, and U+0080 to U+009F, which are 0xC2 and one more byte in UTF-8.
 void PrintPath(const char* path) {
+  bool begins_control = false;
   for (; *path != '\0'; ++path) {
     const auto byte = static_cast<unsigned char>(*path);
-    const bool is_plain = byte >= 0x20 && byte != 0x7f && byte != '\\';
-    if (is_plain) {
-      putchar(byte);
-    } else {
+    const auto next = static_cast<unsigned char>(path[1]);
+    const bool ends_control = begins_control;
+    begins_control = byte == 0xc2 && next >= 0x80 && next < 0xa0;
+    if (byte < 0x20 || byte == 0x7f || byte == '\\' || begins_control || ends_control) {
       printf("\\x%02x", static_cast<unsigned>(byte));
+    } else {
+      putchar(byte);
     }
   }
   fputs(": ", stdout);

@@ -164,14 +164,15 @@ TEST(Verify, LinkStandsForItsFile) {
   ExpectAnswer(Verify({"--trust", file, link}), 0, link + ": trusted\n");
 }
 
+// U+00FC and U+00A0 are not control characters. U+009B and U+0080 are.
 TEST(Verify, EachFileHasOneLineWhateverItsName) {
+  constexpr char kNotAscii[] = "gr\xc3\xbcn \xc2\xa0 \xc2\x9b \xc2\x80 \xff";
   const TempDir directory;
   directory.Write("a\nb: trusted\t\x7f\\\x1b[2J", {});
-  directory.Write("gr\xc3\xbcn \xff", {});
-  ExpectAnswer(VerifyHere({"a\nb: trusted\t\x7f\\\x1b[2J", "gr\xc3\xbcn \xff"}, directory.path()),
-               1,
+  directory.Write(kNotAscii, {});
+  ExpectAnswer(VerifyHere({"a\nb: trusted\t\x7f\\\x1b[2J", kNotAscii}, directory.path()), 1,
                "a\\x0ab: trusted\\x09\\x7f\\x5c\\x1b[2J: not trusted (errno 22, EINVAL)\n"
-               "gr\xc3\xbcn \xff: not trusted (errno 22, EINVAL)\n");
+               "gr\xc3\xbcn \xc2\xa0 \\xc2\\x9b \\xc2\\x80 \xff: not trusted (errno 22, EINVAL)\n");
 }
 
 // A kernel without the feature does not know its fcntl command, and refuses it with EINVAL.
