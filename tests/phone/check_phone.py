@@ -142,6 +142,8 @@ def check_trial(programs, golden):
            "E/ApkToolkit: VELT can't sign a file (result=10000, errno 1", "base.apk: not trusted")
     expect("no phone", trial(programs, good, "no phone"), 2, "try-on-phone: adb finds no phone: connect one, or start adb\n")
     expect("no root", trial(programs, good, "no root"), 2, "install a userdebug build on the phone\n")
+    expect("a full phone", trial(programs, good, "full"), 2, "adb: no space left on device\n",
+           "try-on-phone: this failed: adb push")
     expect("no package", trial(programs, golden), 2, "usage: try-on-phone")
     with tempfile.TemporaryDirectory() as name:
         changed = pathlib.Path(name) / "package"
