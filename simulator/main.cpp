@@ -72,8 +72,7 @@ int main(int argc, char** argv) {
   if (const auto problem = presenter.Begin()) return presenter.GiveUp(names, *problem);
   if (list.others > 0) {
     const std::string others = Counted(list.others, "file", "files");
-    Complain(kAllSigned,
-             others + " below the directories skipped: their names are not those of packages");
+    Complain(kAllSigned, "skipped " + others + " below the directories: not named like a package");
   }
   CatchInterruptions();
   std::vector<std::unique_ptr<Answers>> answers(files.size());

@@ -24,8 +24,9 @@ constexpr char kFooter[] =
     "  1  something was refused: by the tool, by a phone's installer, or by --signer\n"
     "     or --werror\n"
     "  2  the command line is wrong\n"
-    "  3  the simulation could not run, or did not end in time\n"
-    "  4  the tool could not look at a FILE: missing, no permission, read-only\n"
+    "  3  a FILE could not be judged, or the output could not be written\n"
+    "  4  the tool could not look at a FILE: missing, no permission, read-only;\n"
+    "     or a directory has no packages\n"
     "More, with examples: man apktoolkit-sim";
 
 constexpr struct {
@@ -168,8 +169,8 @@ void AddKernelAnswer(CLI::App* app, const char* name, int* error, const char* de
 void AddFiles(CLI::App* app, Options* options) {
   FileListOptions* const files = &options->files;
   app->add_flag("--recursive", files->is_recursive,
-                "Take the packages in and below a directory:\n"
-                ".apk .jar .apks .xapk .apkm .aab");
+                "Look at the packages in and below a directory:\n.apk .jar .apks .xapk .apkm "
+                ".aab");
   CLI::Option* const list = app->add_option("--files-from", files->list,
                                             "Read more FILEs from a list, one a line;\n"
                                             "\"-\" is standard input")
@@ -315,8 +316,8 @@ void AddRun(CLI::App* app, Options* options, std::string* runner) {
                   "beside this program]")
       ->type_name("PATH");
   app->add_option("--runner", *runner,
-                  "Put these words before the tool: an emulator\n"
-                  "that takes -E NAME=VALUE [default: none]")
+                  "Put these words before the tool: an emulator\nthat accepts -E NAME=VALUE "
+                  "[default: none]")
       ->type_name("COMMAND")
       ->take_last();
 }

@@ -56,13 +56,13 @@ std::optional<std::string> ReadNames(const FileListOptions& options,
   }
   // A file name cannot contain a NUL byte. The system would cut the name there.
   if (!options.has_nul && content.find('\0') != std::string::npos) {
-    return title + " has NUL bytes; with -0 they end its names";
+    return title + " contains NUL bytes; use -0 if its names end with NUL bytes";
   }
   const size_t before = names->size();
   for (std::string& name : Split(content, options.has_nul ? '\0' : '\n')) {
     if (!name.empty()) names->push_back(std::move(name));
   }
-  if (names->size() == before) return title + " names no file";
+  if (names->size() == before) return title + " contains no file names";
   return {};
 }
 

@@ -57,7 +57,7 @@ inline constexpr Cause kFileMissing = {"file-missing", Group::kNotLookedAt, Seve
     ChainLink::kKey, "", "there is no such file",
     "Check the name; a relative one counts from the directory in which the tool is run."};
 inline constexpr Cause kFileNoPermission = {"file-no-permission", Group::kNotLookedAt,
-    Severity::kUnseen, ChainLink::kKey, "", "it may not be read",
+    Severity::kUnseen, ChainLink::kKey, "", "there is no permission to read it",
     "Give the user who runs the tool the right to read the file and to enter its "
     "directories."};
 inline constexpr Cause kFileNotOpened = {"file-not-opened", Group::kNotLookedAt, Severity::kUnseen,
@@ -222,7 +222,7 @@ inline constexpr Cause kExponentRefused = {"exponent-refused", Group::kSignature
     "Do not trust this package. Normal keys have the exponent 65537."};
 inline constexpr Cause kCertificateIssued = {"certificate-issued", Group::kSignature,
     Severity::kRefused, ChainLink::kCertificate, "`RSA could not verify certificate`",
-    "its certificate was issued by another (%s), and this tool accepts only self-signed "
+    "its certificate was issued by another subject (%s), and this tool accepts only self-signed "
     "certificates",
     "Sign it with a self-signed certificate: keytool -genkeypair -keyalg RSA -sigalg "
     "SHA256withRSA. This makes another signer: phones refuse the package as an update of a "
@@ -323,14 +323,14 @@ inline constexpr Cause kLibraryDigest = {"library-digest", Group::kLibrary, Seve
     "the manifest has no digest of it that this tool reads: SHA-1 or SHA-256",
     "Sign the package with SHA-256 digests, as apksigner does."};
 inline constexpr Cause kLibraryNoPermission = {"library-no-permission", Group::kLibrary,
-    Severity::kRefused, ChainLink::kNone, "`Can't open file`", "it may not be read",
+    Severity::kRefused, ChainLink::kNone, "`Can't open file`", "there is no permission to read it",
     "Give the user who runs the tool the right to read it and to enter its "
     "directories."};
 inline constexpr Cause kLibraryNotOpened = {"library-not-opened", Group::kLibrary,
     Severity::kRefused, ChainLink::kNone, "`Can't open file`, `File %s is not opened`",
     "it cannot be opened (%s)", "Fix the reported error, and run again."};
 inline constexpr Cause kLibraryNoFile = {"library-no-file", Group::kLibrary, Severity::kRefused,
-    ChainLink::kNone, "`Can't read file`", "what is at its path is not a regular file, or is too "
+    ChainLink::kNone, "`Can't read file`", "its path is not a regular file, or the file is too "
     "large to read",
     "Find out who put it there, and install the package again."};
 inline constexpr Cause kLibraryInPackage = {"library-in-package", Group::kLibrary,
@@ -355,8 +355,8 @@ inline constexpr Cause kLibraryMissing = {"library-missing", Group::kLibrary, Se
     ChainLink::kNone, "`Can't open file`", "it is not beside the package, but other libraries are",
     "Install the package again, unless the installer leaves it out on purpose."};
 inline constexpr Cause kLibraryOtherAbi = {"library-other-abi", Group::kLibrary, Severity::kNothing,
-    ChainLink::kNone, "", "no phone of this kind installs it",
-    "Nothing to do: the tool knows no directory for its ABI."};
+    ChainLink::kNone, "", "the tool knows no directory for its ABI",
+    "Nothing to do."};
 inline constexpr Cause kPackageRefused = {"package-refused", Group::kLibrary, Severity::kFollows,
     ChainLink::kNone, "`VeltSignJni: malformed apk`, `Apk archive is not valid`",
     "the package is refused", "First fix the reason why the package is refused."};
@@ -370,7 +370,7 @@ inline constexpr Cause kLibraryNotExtracted = {"library-not-extracted", Group::k
     "Copy or build the package again; unzip -t names the fault."};
 inline constexpr Cause kLibraryBehindDamage = {"library-behind-damage", Group::kLibrary,
     Severity::kRefused, ChainLink::kNone, "",
-    "the tool did not reach it: a damaged entry ends its walk over the libraries",
+    "the tool did not reach it: after a damaged entry, it reads no further libraries",
     "Copy or build the package again; unzip -t names the damaged entry."};
 
 // ---- The key.
@@ -448,7 +448,7 @@ inline constexpr Cause kEntriesChanged = {"entries-changed", Group::kWarning, Se
     "Sign the package again, as the last step that changes it. If you did not build it, do not "
     "trust it."};
 inline constexpr Cause kEntriesMissing = {"entries-missing", Group::kWarning, Severity::kWarning,
-    ChainLink::kNone, "", "%s: in the manifest and not in the package",
+    ChainLink::kNone, "", "%s: listed in the manifest, but missing in the package",
     "Sign the package again, as the last step that changes it. If you did not build it, do not "
     "trust it."};
 inline constexpr Cause kEntriesNotCompared = {"entries-not-compared", Group::kWarning,
@@ -465,8 +465,8 @@ inline constexpr Cause kDebugKey = {"debug-key", Group::kWarning, Severity::kWar
     "workstation makes another one", "Sign a release with a release key."};
 inline constexpr Cause kWeakDigest = {"weak-digest", Group::kWarning, Severity::kWarning,
     ChainLink::kNone, "", "SHA-1 or MD5 is in use: %s",
-    "Sign it again with SHA-256: apksigner does so with --min-sdk-version 18. Certify the key of a "
-    "new app with SHA-256 as well; for a published one that makes another signer."};
+    "Sign it again with SHA-256: apksigner does so with --min-sdk-version 18. Certify the key of "
+    "a new app with SHA-256 as well; for a published app, a new certificate makes another signer."};
 inline constexpr Cause kCertificateExpired = {"certificate-expired", Group::kWarning,
     Severity::kWarning, ChainLink::kNone, "", "its certificate expired on %s",
     "Phones still install it. A published app must keep its certificate: a new one makes another "

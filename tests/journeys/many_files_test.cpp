@@ -55,8 +55,7 @@ class ManyFiles : public testing::Test {
 };
 
 constexpr char kOthers[] =
-    "apktoolkit-sim: 1 file below the directories skipped: their names are not those of "
-    "packages\n";
+    "apktoolkit-sim: skipped 1 file below the directories: not named like a package\n";
 
 }  // namespace
 
@@ -116,7 +115,7 @@ TEST_F(ManyFiles, NamesComeFromAList) {
 
 TEST_F(ManyFiles, ListThatNamesNothingIsNoSuccess) {
   EXPECT_EQ(Told(Do("sim good/base.apk --files-from - </dev/null")),
-            Lines({"-> 2", "apktoolkit-sim: the list on standard input names no file\n"}));
+            Lines({"-> 2", "apktoolkit-sim: the list on standard input contains no file names\n"}));
   EXPECT_EQ(Told(Do("sim --files-from none")),
             Lines({"-> 2",
                    "apktoolkit-sim: cannot read the list none: No such file or "

@@ -48,8 +48,8 @@ TEST_F(Reason, CertificateThatAnAuthorityIssued) {
   EXPECT_EQ(
       Told(4),
       Lines({"REFUSED  base.apk",
-             "  ✗ package                not signed: its certificate was issued by "
-             "another (CN=rsa-2048, O=Example), and this tool accepts only self-signed "
+             "  ✗ package                not signed: its certificate was issued by another "
+             "subject (CN=rsa-2048, O=Example), and this tool accepts only self-signed "
              "certificates",
              "      Sign it with a self-signed certificate: keytool -genkeypair -keyalg RSA",
              "      -sigalg SHA256withRSA. This makes another signer: phones refuse the", "-> 1"}));
@@ -220,9 +220,9 @@ TEST_F(Reason, NoPermission) {
   if (!CanMakeNamespaces()) GTEST_SKIP() << kNoNamespaces;
   Take("apksigner-sha256-2048");
   std::filesystem::permissions(directory_ / "base.apk", std::filesystem::perms::none);
-  EXPECT_EQ(
-      Told(2, {}, "base.apk", {"unshare", "-U"}),
-      Lines({"NOT LOOKED AT  base.apk", "  ✗ file  not looked at: it may not be read", "-> 4"}));
+  EXPECT_EQ(Told(2, {}, "base.apk", {"unshare", "-U"}),
+            Lines({"NOT LOOKED AT  base.apk",
+                   "  ✗ file  not looked at: there is no permission to read it", "-> 4"}));
 }
 
 TEST_F(Reason, ReadOnlyFileSystem) {

@@ -42,7 +42,7 @@ def main():
         good, own = compiled(directory, "good", EARLIER), compiled(directory, "own", OWN)
         result = compare(good, own)
         if result.returncode != 0 or "2 objects" not in result.stdout:
-            problems.append(f"what the level has is refused: {result.stdout}")
+            problems.append(f"functions that the API level has are refused: {result.stdout}")
         result = compare(good)
         if result.returncode != 1 or f"Own called by {good}\n" not in result.stdout:
             problems.append(f"a function that is nowhere is not noticed: {result.stdout}")
@@ -52,7 +52,7 @@ def main():
             if result.returncode != 1 or symbol not in result.stdout or "read" in result.stdout:
                 problems.append(f"{symbol} is not noticed: {result.stdout}")
         if compare().returncode == 0:
-            problems.append("no object at all is taken for good ones")
+            problems.append("a call without objects succeeds")
     return report(problems, "scripts/android: its function compare")
 
 

@@ -104,7 +104,7 @@ def codes(rows):
 def reasons_problems(rows, messages):
     problems = []
     if len({row["code"] for row in rows}) != len(rows):
-        problems.append("a code is there twice")
+        problems.append("two causes have the same code")
     chosen = "".join(path.read_text() for path in (ROOT / "simulator").rglob("*.cpp"))
     for row in rows:
         name = row["name"]

@@ -114,8 +114,9 @@ TEST(FileList, ListsAreReadByLinesOrByNulBytes) {
   const std::string nul = directory.Write("nul", ToBytes(with_nul));
   EXPECT_EQ(Listed(directory, {{}, nul, true, false}), Lines({"a\nb", "c"}));
   // The part of a name after a NUL byte would be lost.
-  EXPECT_EQ(Listed(directory, {{}, nul, false, false}),
-            Lines({"the list " + nul + " has NUL bytes; with -0 they end its names"}));
+  EXPECT_EQ(
+      Listed(directory, {{}, nul, false, false}),
+      Lines({"the list " + nul + " contains NUL bytes; use -0 if its names end with NUL bytes"}));
 }
 
 TEST(FileList, DirectoriesOfAListAreWalkedToo) {
@@ -132,7 +133,7 @@ TEST(FileList, ListThatNamesNothingIsNone) {
   for (const char* content : {"", "\n\n"}) {
     const std::string list = directory.Write("list", ToBytes(content));
     EXPECT_EQ(Listed(directory, {{"a.apk"}, list, false, false}),
-              Lines({"the list " + list + " names no file"}));
+              Lines({"the list " + list + " contains no file names"}));
   }
 }
 

@@ -71,7 +71,7 @@ TEST(ReportText, HasTheVerdictTheItemsAndWhatToDo) {
       "lists\n"
       "      The file beside the package was changed after it was installed. Install\n"
       "      the package again.\n"
-      "  – lib/x86_64/libvault.so  nothing to sign: no phone of this kind installs it\n"
+      "  – lib/x86_64/libvault.so  nothing to sign: the tool knows no directory for its ABI\n"
       "  ✓ key                     registered for com.example.vault\n");
 }
 

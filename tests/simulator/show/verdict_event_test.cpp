@@ -95,7 +95,7 @@ TEST(VerdictEvent, HoldsTheWholeReport) {
        "cure": "Install the package again, unless the installer leaves it out on purpose."},
       {"kind": "library", "name": "lib/x86/a.so", "entry": "lib/x86/a.so",
        "state": "nothing-to-sign", "reason": "library-other-abi",
-       "text": "no phone of this kind installs it",
+       "text": "the tool knows no directory for its ABI",
        "cure": "Nothing to do: the tool knows no directory for its ABI."},
       {"kind": "key", "name": "com.app", "state": "registered"}],
     "warnings": [{"reason": "signing-block-damaged",
