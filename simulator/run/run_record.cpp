@@ -133,7 +133,8 @@ void Reader::ReadError(const LogLine& line) {
       record_.has_no_key_path = true;
       return;
     case LogMeaning::kRegistrationFailed:
-      // The journal already has the answer as an event.
+      // The event of the registration normally has the failure. If no such event came last, the log
+      // line is kept.
       if (record_.registrations.empty() ||
           IsZuSuccess(static_cast<int>(record_.registrations.back().result))) {
         record_.other_errors.push_back(line.whole);
@@ -164,8 +165,8 @@ void Reader::ReadVerify(const json& event) {
 }
 
 // True if the kernel is asked about the file itself. While the tool signs libraries or the file,
-// the step decides. At other times the tool asks the kernel nothing. If another program asks, the
-// path decides.
+// the step decides. At other times the tool asks the kernel nothing. Another program (--tool) may
+// still ask. Then the path decides, and an empty path counts as the file itself.
 bool Reader::IsOwn(const std::string& path) const {
   if (step_ == Step::kLibraries || step_ == Step::kFile) return step_ == Step::kFile;
   return path.empty() || path == record_.PathForTool();

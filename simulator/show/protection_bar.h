@@ -16,7 +16,7 @@ struct DrawnPart {
   Share share;
   double percent;  // of all bytes
   double start;    // where it is drawn, in percent of the bar's width
-  double width;    // in the same unit; enlarged if it would be hard to see; 0: no bytes
+  double width;    // in the same unit; large enough to be seen; 0: no bytes
 };
 
 // Returns the parts in order, from the best protected one to the bytes between the entries. Empty

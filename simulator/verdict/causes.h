@@ -483,7 +483,7 @@ inline constexpr Cause kCertificateOtherKey = {"certificate-other-key", Group::k
     "package, do not trust it: other programs see another key in it."};
 inline constexpr Cause kBlockAmbiguous = {"block-ambiguous", Group::kWarning, Severity::kAlarm,
     ChainLink::kNone, "",
-    "others may read another signer in its signature block than the tool does: %s",
+    "other programs may find a different signer in its signature block: %s",
     "Sign the package again with apksigner. If you did not build it, do not trust it."};
 inline constexpr Cause kOtherPackageName = {"other-package-name", Group::kWarning, Severity::kAlarm,
     ChainLink::kNone, "", "phones install it as %s, but the tool reads another package name",

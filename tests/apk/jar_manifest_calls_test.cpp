@@ -69,7 +69,8 @@ std::vector<std::string> ShortNames(size_t count) {
 }
 
 // A sort compares each name with about log2(count) others. The section is sorted again only after
-// enough new names, which at most doubles the comparisons. This test allows twice that number.
+// its number of names has more than doubled. All sorts together therefore make at most twice the
+// comparisons of one sort. This test allows twice that number.
 TEST_F(JarManifestCalls, DistinctShortNamesAreSortedInLogarithmicTime) {
   std::vector<std::string> names = ShortNames(4096);
   std::shuffle(names.begin(), names.end(), std::mt19937(1));

@@ -37,8 +37,8 @@ struct ProcessedBlock {
   ProcessedBlock(const ProcessedBlock&) = delete;
   ProcessedBlock& operator=(const ProcessedBlock&) = delete;
 
-  // The line about an unreadable header whose tag was decoded as `tag`. Its offset is the distance
-  // from the block to the null address, modulo the size of the address space.
+  // The line about an unreadable header whose tag was decoded as `tag`. The offset in this line is
+  // 0 minus the address of the block, as an unsigned 64-bit number.
   std::string UnreadableTag(int32_t tag) const {
     char line[128];
     snprintf(line, sizeof(line),

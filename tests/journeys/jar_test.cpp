@@ -40,7 +40,7 @@ void SetAttribute(const std::string& path, const std::string& value) {
 }
 
 // The key block that is registered for a JAR: four SHA-256 digests. The first is the digest of the
-// path, and each other one is the digest of the digest before it.
+// path. Each later digest is the digest of the previous digest.
 Bytes KeyBlock(const std::string& path) {
   Bytes block(4 * SHA256_DIGEST_LENGTH);
   SHA256(reinterpret_cast<const uint8_t*>(path.data()), path.size(), &block[0]);
@@ -198,7 +198,7 @@ TEST(Jar, TamperedSignatureDoesNotMatterToOneThatIsTrusted) {
   EXPECT_EQ(run.status, 0);
 }
 
-// The log lines that follow when the zip library refuses the file.
+// The timeline of a run for a file that the zip library refuses.
 std::string NotAnArchive(const std::string& path, const std::string& reason) {
   return Timeline({Log(6, "OpenArchiveFd(3) [file: " + path + "] returned: " + reason + "\n"),
                    Log(4, "VeltSignJni starts: 3.\n"),

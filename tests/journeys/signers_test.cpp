@@ -65,7 +65,7 @@ TEST(SignerIdentifier, MayBeTheCertificatesKeyIdentifier) {
   for (const char* name : {"openssl-cms-keyid", "openssl-cms-sha1"}) {
     const std::string text = Told(name);
     EXPECT_EQ(text.rfind("SIGNED", 0), 0U) << text;
-    EXPECT_EQ(text.find("others may read another signer"), std::string::npos) << text;
+    EXPECT_EQ(text.find("other programs may find a different signer"), std::string::npos) << text;
   }
 }
 

@@ -234,7 +234,7 @@ TEST(TwoFaces, SignatureThatNamesAnotherCertificateIsAmbiguous) {
   const Told told(MakePackage(options));
   EXPECT_EQ(told.status, 0);
   EXPECT_EQ(told.Warnings(), Codes({"block-ambiguous"}));
-  EXPECT_TRUE(Has(told.head, "   ! others may read another signer"));
+  EXPECT_TRUE(Has(told.head, "   ! other programs may find a different signer"));
 }
 
 TEST(TwoFaces, PackageNameOfAnotherNamespaceIsToldBesideTheInstallers) {

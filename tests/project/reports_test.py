@@ -1,5 +1,5 @@
 #!/usr/bin/env python3
-"""Reads the JUnit reports and SARIF logs of real runs. Some of the files have odd names.
+"""Reads the JUnit reports and SARIF logs of real runs. Some of the checked files have odd names.
 
 Arguments: the directory of the golden packages, and the command line that starts apktoolkit-sim.
 
@@ -102,9 +102,9 @@ def sarif_problems(verdicts, log):
     for result in made["results"]:
         place = result["locations"][0]["physicalLocation"]["artifactLocation"]
         if made["artifacts"][place["index"]]["location"]["uri"] != place["uri"]:
-            problems.append(f"{place} is another artifact")
+            problems.append(f"the index of {place} belongs to another artifact")
         if made["tool"]["driver"]["rules"][result["ruleIndex"]]["id"] != result["ruleId"]:
-            problems.append(f"{result['ruleId']} is another rule")
+            problems.append(f"the rule index of {result['ruleId']} belongs to another rule")
     found = [(result["ruleId"], result["level"]) for result in made["results"]]
     expected = []
     for verdict in verdicts:
@@ -115,7 +115,7 @@ def sarif_problems(verdicts, log):
     if found != expected:
         problems.append(f"results {found}, and not {expected}")
     if made["invocations"][0]["executionSuccessful"] != all(v["status"] < 3 for v in verdicts):
-        problems.append("the run was successful or not, and the log says otherwise")
+        problems.append("executionSuccessful does not agree with the verdicts")
     return problems
 
 
@@ -154,7 +154,7 @@ def main():
                 if str(file).encode(errors="surrogateescape") not in paths:
                     problems.append(f"{file!r} is no artifact")
         if seen != {0, 1, 3, 4}:
-            problems.append(f"no run for each status: {seen}")
+            problems.append(f"the statuses are {seen}, and not 0, 1, 3 and 4")
     return report(problems)
 
 

@@ -24,7 +24,7 @@ Options Parsed(Lines words) {
   return options;
 }
 
-// The status and the standard error of the simulator for a command line.
+// The status and the output of the simulator for a command line.
 ProcessResult Told(const Lines& words) {
   Lines command = {SimulatorPath()};
   command.insert(command.end(), words.begin(), words.end());

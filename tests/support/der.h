@@ -33,7 +33,8 @@ Bytes Element(uint8_t identifier, const std::string& contents);
 
 Bytes Sequence(const std::vector<Bytes>& elements);
 Bytes Set(const std::vector<Bytes>& elements);
-// [number] around `contents`: constructed, or the primitive form of an IMPLICIT string.
+// An element with the context-specific tag [number]: constructed, and primitive as for an IMPLICIT
+// string.
 Bytes Context(uint8_t number, const Bytes& contents);
 Bytes ContextPrimitive(uint8_t number, const Bytes& contents);
 

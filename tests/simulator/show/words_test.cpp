@@ -91,7 +91,7 @@ TEST(HeadFacts, SoundTheAlarmsAndNoOtherWarnings) {
   Report report;
   report.warnings = {{&cause::kUnlistedEntries, "x"}, {&cause::kBlockAmbiguous, "why"}};
   EXPECT_EQ(HeadFacts(report, "..."),
-            Lines({"! others may read another signer in its signature block than the tool does: "
+            Lines({"! other programs may find a different signer in its signature block: "
                    "why",
                    "2 warnings"}));
   report.warnings.erase(report.warnings.begin());
@@ -111,7 +111,7 @@ TEST(HeadFacts, HaveTheReasonInPlaceOfTheSigner) {
   EXPECT_EQ(HeadFacts(report, "..."), Lines({"libzu answered 7"}));
 }
 
-// The tool's other refusals are not the reason why phones do not install the package.
+// The tool's own refusals are not the reason why phones do not install the package.
 TEST(HeadFacts, HaveTheInstallersReasonWhereTheVerdictIsHis) {
   Report report = WithSigner();
   report.verdict = Verdict::kNotInstallable;
@@ -170,8 +170,8 @@ TEST(SignerRows, SayOfTheKeyWhatTheKernelGot) {
                              "98302ce8 (of the modulus alone: what the kernel got)"));
   report.key->was_got = false;
   EXPECT_EQ(SignerRows(report)[5].second, "98302ce8 (of the modulus alone, as the tool reads it)");
-  // A certificate is also shown if others cannot read its key. A key is also shown without a
-  // certificate.
+  // The certificate is also shown if the crypto library cannot read its key. The kernel's key is
+  // also shown if there is no certificate.
   report.signer->key = {"RSA", 0, "spki", ""};
   EXPECT_EQ(SignerRows(report).size(), 5U);
   EXPECT_EQ(SignerRows(report)[3].first, "public key SHA-256 digest");
