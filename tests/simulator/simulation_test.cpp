@@ -247,11 +247,18 @@ TEST(Simulation, RunsOverOneFileAtTheSameTimeDoNotDisturbEachOther) {
   options.entries.push_back({"lib/arm64-v8a/liba.so", ToBytes("a")});
   const std::string file = directory / "base.apk";
   MakePackage(options).WriteTo(file);
-  Lines words = {"--installer=off", "--jobs", "8"};
-  words.insert(words.end(), 40, file);
-  const ProcessResult result = Told(words);
-  EXPECT_EQ(result.output.find("changed"), std::string::npos) << result.output;
-  EXPECT_EQ(result.output.find("NOT SIMULATED"), std::string::npos);
+  constexpr int kRuns = 40;
+  Lines words = {SimulatorPath(), "--quiet", "--installer=off", "--install=phone", "--jobs", "8"};
+  words.insert(words.end(), kRuns, file);
+  const ProcessResult result = RunProcess(words);
+  Lines verdicts;
+  for (const std::string& line : LinesOf(result.output)) {
+    verdicts.push_back(line.substr(0, line.find("  ")));
+  }
+  Lines expected(kRuns, "SIGNED");
+  expected.push_back(std::to_string(kRuns) + " files: " + std::to_string(kRuns) + " signed");
+  EXPECT_EQ(verdicts, expected);
+  EXPECT_EQ(result.status, 0);
 }
 
 // The tool and the simulator map the central directory, and the test cuts it off again and again.
