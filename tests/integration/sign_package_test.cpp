@@ -140,12 +140,10 @@ TEST_F(AfterAnUpdate, OneThatIsRefusedKeepsNoOtherFromBeingSigned) {
   const InstalledPackage none = {Install("apksigner-newer-only").path, ""};
   const InstalledPackage good = Install("apksigner-sha256-2048");
   const ProcessResult run = SignAll(Line(other) + Line(none) + Line(good));
-  EXPECT_EQ(run.output,
-            other.path +
-                ": not trusted: its JAR signature is of another signer than the package "
-                "manager's\n" +
-                none.path + ": not trusted: it has no good JAR signature\n" + good.path +
-                ": trusted\n");
+  EXPECT_EQ(
+      run.output,
+      other.path + ": not trusted: its JAR signer is not one of the package manager's signers\n" +
+          none.path + ": not trusted: it has no good JAR signature\n" + good.path + ": trusted\n");
   EXPECT_EQ(run.status, 1);
 }
 
