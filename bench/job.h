@@ -1,6 +1,6 @@
 // The steps that the floor and the peer share: all of the tool's job except the verification. Each
 // step is done once, and only needed data is kept. Both programs read only the good packages that
-// bench_packages makes, and exit if anything fails.
+// bench_packages makes, and exit if anything unexpected happens.
 #pragma once
 
 #include <cstdint>
@@ -29,7 +29,7 @@ class Buffer {
 struct GivenPackage {
   int fd;
   std::string path;
-  struct ZipArchive* zip;  // the platform library's
+  struct ZipArchive* zip;  // of the platform's zip library
 };
 
 GivenPackage OpenGiven(int argc, char** argv);
@@ -38,8 +38,9 @@ std::string SignatureFileName(const GivenPackage& package);
 // Returns the package's name from the compiled manifest.
 std::string WalkManifest(const Buffer& compiled_manifest);
 
-// Does three things for each library beside the package, as the tool would: reads the whole file,
-// calls `check` with the entry's name and the file's bytes, and asks the kernel to sign the file.
+// Does three things for each library beside the package: reads the whole file, calls `check` with
+// the entry's name and the file's bytes, and tries to sign the file, as the tool does on a
+// workstation.
 using CheckLibrary = std::function<void(const std::string& name, const Buffer& content)>;
 void SignLibraries(const GivenPackage& package, const CheckLibrary& check);
 void SignGiven(const GivenPackage& package);

@@ -15,7 +15,7 @@ void WalkElements(const uint8_t* data, size_t size, int depth) {
   while (position < size) {
     asn1_hdr header;
     const int result = asn1_get_next(data + position, size - position, &header);
-    Require(result == 0 || result == -1, "asn1_get_next answers 0 or -1");
+    Require(result == 0 || result == -1, "asn1_get_next returns 0 or -1");
     if (result != 0) {
       Require(header.payload == nullptr, "a failed read leaves no payload");
       return;

@@ -16,7 +16,7 @@ extern "C" int LLVMFuzzerTestOneInput(const uint8_t* data, size_t size) {
   std::vector<uint8_t> out(room);
   size_t length = room;
   const int result = base64decode(text.data(), text.size(), out.data(), &length);
-  Require(result == 0 || result == 1, "base64decode answers 0 or 1");
+  Require(result == 0 || result == 1, "base64decode returns 0 or 1");
   if (result != 0) {
     Require(length == room, "a failure does not change the length");
     Require(!expected || expected->size() > room, "a refused text is not base64 or does not fit");

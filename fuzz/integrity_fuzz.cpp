@@ -19,7 +19,8 @@ void CheckReading(const std::deque<std::string>& texts, uint32_t wait) {
   Require(result == 0 || result == kVeltFailure, "the result is success or failure");
   Require(result != 0 || wait == 0 || value != 0xFFFFFFFF,
           "a waiting read returns a settled value");
-  Require(result == 0 || wait != 0 || value == kUntouched, "a failed read leaves the value");
+  Require(result == 0 || wait != 0 || value == kUntouched,
+          "a failed read without waiting keeps the value");
   Require(phone.events.size() <= 2 * texts.size(), "the tool reads each text at most once");
 }
 

@@ -37,7 +37,7 @@ void JudgeText(std::string_view bytes) {
     Require(!HasHidden(shown) && shown.find('\n') == std::string::npos,
             "no hidden character is printed");
     const bool is_ascii = std::all_of(shown.begin(), shown.end(), [](char c) { return c >= 0; });
-    Require(has_utf8 || is_ascii, "what cannot be shown is escaped");
+    Require(has_utf8 || is_ascii, "without UTF-8, only ASCII is printed");
   }
 }
 
@@ -78,7 +78,7 @@ void JudgeRecord(const Events& events) {
             "the kernel got the recorded payload");
   }
   Require(is_signed == CountOf(events, "sign", true),
-          "as many files are signed as the kernel signed");
+          "the record has as many signed files as the kernel signed");
   Require(answers == CountOf(events, "sign", false), "each answer of the kernel is kept");
   Require(record.registrations.size() == CountOf(events, "register", false),
           "each registration is kept");
@@ -90,7 +90,7 @@ void JudgeJournal(std::string_view bytes) {
   const Events events = ParseEvents(std::string(bytes));
   JudgeRecord(events);
   const std::vector<TimelineLine> timeline = MakeTimeline(events, "/data/app/base.apk");
-  Require(timeline.size() <= events.size(), "a line for each event at most");
+  Require(timeline.size() <= events.size(), "each event has at most one line");
   std::ostringstream out;
   PrintTimeline(timeline, Look(), out);
   Require(!HasHidden(out.str()), "no hidden character is printed");

@@ -1,4 +1,4 @@
-// apk/manifest_mf.h: parses any text. A second reader must find the same.
+// apk/manifest_mf.h: parses any text. A second reader must return the same result.
 #include "apk/manifest_mf.h"
 
 #include <map>
@@ -27,7 +27,7 @@ extern "C" int LLVMFuzzerTestOneInput(const uint8_t* data, size_t size) {
   Require(valid == static_cast<bool>(manifest), "the object knows the result of load()");
 
   const ManifestModel expected = ReadManifest(text);
-  Require(valid == expected.valid, "both readers take the text, or none");
+  Require(valid == expected.valid, "both readers accept the text, or both refuse it");
   Require(SectionsOf(manifest) == expected.sections, "both readers find the same sections");
 
   manifest.load(text);

@@ -28,7 +28,7 @@ class Reader {
     return false;
   }
 
-  // Returns false at the end of the text, and if the text is malformed.
+  // Returns false at the end of the text, or if the text is malformed.
   bool ReadSection() {
     std::map<std::string, std::string> section;
     position_ = std::min(text_.find_first_not_of(" \r\n", position_), text_.size());
@@ -49,7 +49,7 @@ class Reader {
     }
   }
 
-  // The value after the colon, and its continuation lines.
+  // Reads the value after the colon, with its continuation lines. Returns what follows the value.
   After ReadValue(size_t colon, std::string& value) {
     position_ = colon + 2;
     bool has_text = At(colon + 1) == ' ';

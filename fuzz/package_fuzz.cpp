@@ -44,7 +44,7 @@ class Installation {
  public:
   Installation() {
     char root[] = "/dev/shm/apktoolkit-fuzz.XXXXXX";
-    Require(mkdtemp(root) != nullptr, "a directory in memory");
+    Require(mkdtemp(root) != nullptr, "a directory in memory is made");
     root_ = root;
     directory_ = root_ + "/app/";
     for (const char* const abi : {"arm", "arm64"}) {
@@ -148,7 +148,7 @@ class Judge {
     }
     Require(payload == "2000" + Hex(DigestOf(Digest::kSha256, model_->key())),
             "a payload is the digest of the signer's key");
-    Require(model_->is_good(), "nothing is signed for a package that is not good");
+    Require(model_->is_good(), "only a good package and its libraries are signed");
     if (is_package_file) return;
     const Bytes content = ContentOf(fd);
     Require(model_->AllowsLibrary(TheInstallation().directory(), PathOf(fd), content),
@@ -158,7 +158,7 @@ class Judge {
   void JudgeRegistration(const std::string& data, bool is_package_file) {
     Require(is_package_file, "a registration is for the file itself");
     if (model_->is_package()) {
-      Require(model_->is_good(), "nothing is registered for a package that is not good");
+      Require(model_->is_good(), "a package is registered only if it is good");
       Require(data == Hex(model_->key()), "a package registers its signer's key");
     } else {
       Require(phone_.zu_attribute_size > 0, "only a JAR with the attribute is registered");

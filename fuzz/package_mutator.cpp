@@ -102,9 +102,8 @@ void EditText(ZipItem& item, const std::string& name, const std::string& suffix,
   item.data = ToBytes(text);
 }
 
-// Repairs the signatures if `depth` is at least 1, the manifest's digest if it is at least 2, and
-// the entries' digests if it is at least 3. The signatures come last, because they cover the
-// digests.
+// At depth 1, repairs the signatures. At depth 2, also repairs the manifest's digest. From depth 3
+// on, also repairs the entries' digests. The signatures come last, because they cover the digests.
 void Repair(Items& items, unsigned depth) {
   const auto find = [&](const std::string& end) {
     return std::find_if(items.begin(), items.end(),

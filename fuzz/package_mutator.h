@@ -1,6 +1,6 @@
 // Mutates whole packages so that many of them get past the first check. Up to three changes are
 // made to the entries. In most mutations, some digests and signatures are then repaired. At the
-// end, the archive is built again.
+// end, the archive is built again. Some archives are mutated as plain bytes instead.
 #pragma once
 
 #include <cstddef>

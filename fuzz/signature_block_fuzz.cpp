@@ -36,7 +36,7 @@ extern "C" int LLVMFuzzerTestOneInput(const uint8_t* data, size_t size) {
   Bytes block(data, data + size);
   pkcs7 record = {};
   const int parsed = processCert(block.data(), static_cast<uint32_t>(size), &record);
-  Require(parsed == 0 || parsed == 1, "processCert answers 0 or 1");
+  Require(parsed == 0 || parsed == 1, "processCert returns 0 or 1");
   if (parsed == 0) CompareWithStrictReader(record, block);
 
   ApkTools::Apk apk(-1);

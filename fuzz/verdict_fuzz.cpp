@@ -50,7 +50,7 @@ struct Run {
   std::string journal = Event("start").Text("file", "base.apk").Text("path", kPaths[0]).Line();
   std::vector<std::string> granted;  // the payloads of what the kernel signed
   std::vector<std::string> registered;
-  bool has_failure = false;  // of the kernel, of libzu, or of the tool itself
+  bool has_failure = false;  // of a signing, of a registration, or of the tool itself
 };
 
 void AddLog(Input& input, Run* run) {

@@ -21,32 +21,35 @@ void CheckName(const x509_name& name, const uint8_t* data, size_t size) {
   for (uint64_t i = 0; i < name.attribute_count; ++i) {
     const x509_name_attribute& attribute = name.attributes[i];
     Require(attribute.type >= 1 && attribute.type <= 8, "an attribute is of a known kind");
-    Require(LiesIn(attribute.value, attribute.value_length, data, size), "an attribute's value");
+    Require(LiesIn(attribute.value, attribute.value_length, data, size),
+            "an attribute's value is in the input");
     Require(attribute.value_length == 0 ||
                 memchr(attribute.value, 0, attribute.value_length) == nullptr,
             "no NUL in a name");
   }
-  Require(LiesIn(name.email, name.email_length, data, size), "email");
-  Require(LiesIn(name.alt_email, name.alt_email_length, data, size), "alt_email");
-  Require(LiesIn(name.dns, name.dns_length, data, size), "dns");
-  Require(LiesIn(name.uri, name.uri_length, data, size), "uri");
-  Require(LiesIn(name.ip, name.ip_length, data, size), "ip");
-  Require(name.rid.len <= 20, "rid");
+  Require(LiesIn(name.email, name.email_length, data, size), "the email is in the input");
+  Require(LiesIn(name.alt_email, name.alt_email_length, data, size),
+          "the alt_email is in the input");
+  Require(LiesIn(name.dns, name.dns_length, data, size), "the dns is in the input");
+  Require(LiesIn(name.uri, name.uri_length, data, size), "the uri is in the input");
+  Require(LiesIn(name.ip, name.ip_length, data, size), "the ip is in the input");
+  Require(name.rid.len <= 20, "the rid has at most 20 arcs");
 }
 
 void CheckRecord(const x509_certificate& record, const uint8_t* data, size_t size) {
   Require(record.next == nullptr, "the record has no next record");
-  Require(record.version <= 2, "version");
-  Require(LiesIn(record.cert_start, record.cert_length, data, size), "certificate");
+  Require(record.version <= 2, "the version is at most 2");
+  Require(LiesIn(record.cert_start, record.cert_length, data, size),
+          "the certificate is in the input");
   Require(LiesIn(record.tbs_start, record.tbs_length, record.cert_start, record.cert_length),
-          "to-be-signed part");
+          "the to-be-signed part is in the certificate");
   Require(record.public_key != nullptr && LiesIn(record.public_key, record.public_key_length,
                                                  record.tbs_start, record.tbs_length),
-          "public key");
+          "the public key is in the to-be-signed part");
   Require(record.signature_value != nullptr &&
               LiesIn(record.signature_value, record.signature_value_length, record.cert_start,
                      record.cert_length),
-          "signature");
+          "the signature is in the certificate");
   CheckName(record.issuer, data, size);
   CheckName(record.subject, data, size);
 }

@@ -1,7 +1,7 @@
-// Reads every *.mf file of a directory with the JDK's own parser. Writes the parsed contents to
-// *.dump, and the manifest as the JDK writes it to *.rewritten. The dump has a line "Section
-// <name>" per section (the main section first, without a name) and a line "<attribute>: <value>"
-// per attribute. Sections and attributes are sorted by name.
+// Reads every *.mf file of a directory with the JDK's own parser. For each FILE, writes the parsed
+// contents to FILE.dump, and the manifest in the JDK's own layout to FILE.rewritten. The dump has a
+// line "Section <name>" per section (the main section first, without a name) and a line
+// "<attribute>: <value>" per attribute. Sections and attributes are sorted by name.
 import java.io.FileInputStream;
 import java.io.FileOutputStream;
 import java.io.IOException;

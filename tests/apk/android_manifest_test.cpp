@@ -250,8 +250,8 @@ TEST(AndroidManifestAttribute, ALoneStringWithoutTextIsMissing) {
             (Facts{"", false}));
 }
 
-// ---- Unpaired surrogates. The platform drops them when it converts a text to UTF-8. The tool does
-// not convert names and values, but compares them as if they were converted.
+// ---- Unpaired surrogates. The platform drops them when it converts a text to UTF-8. The tool
+// converts only the package's name. It compares other texts as if they were converted.
 
 const std::string kHigh = "\xED\xA0\x80", kLow = "\xED\xB0\x80";  // U+D800, U+DC00
 
@@ -378,7 +378,7 @@ TEST(AndroidManifestDocument, OneThatIsCutShortAnywhereIsReadOrRefusedWithoutHar
   EXPECT_LT(read, whole.size());
 }
 
-// Replaces these bytes, which must occur once in the document.
+// Returns the document with `new_bytes` in place of `old_bytes`, which must occur once.
 Bytes Replaced(Bytes document, const Bytes& old_bytes, const Bytes& new_bytes) {
   const auto at = std::search(document.begin(), document.end(), old_bytes.begin(), old_bytes.end());
   EXPECT_NE(at, document.end());

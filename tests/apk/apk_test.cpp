@@ -381,7 +381,7 @@ TEST(ApkInit, AManifestWithoutSectionsMakesAGoodPackage) {
 
 // ---- The digests that the manifest records.
 
-// A package whose manifest has these one or two sections.
+// A package whose manifest has these sections after its main section.
 PackageOptions WithSections(const JarText& sections) {
   return WithoutDexListedBy(JarText::Manifest().EndSection().text() + sections.text());
 }

@@ -66,7 +66,7 @@ TEST(ApkIteration, AFilterThatNoNameCanHaveIsAnInvalidName) {
 
 // ---- Entries with false headers or damaged data.
 
-// The log for a package with this Android manifest.
+// The log message for a package with this Android manifest; empty if there is not exactly one.
 std::string LogOfAndroidManifest(const ZipItem& item) {
   Package package = MakePackage(WithoutDex());
   package.Item(kAndroidManifestName) = item;

@@ -10,8 +10,7 @@
 
 namespace {
 
-// The result of base64decode() for `text` and `room` bytes of output. Unreadable memory follows
-// both buffers.
+// The result of base64decode(), its `*out_length`, and the contents of its `out`.
 struct Decoded {
   int result;
   size_t length;
@@ -29,6 +28,7 @@ void PrintTo(const Decoded& decoded, std::ostream* out) {
 
 constexpr uint8_t kUntouched = 0xEE;
 
+// Decodes `text` into a buffer of `room` bytes. Unreadable memory follows both buffers.
 Decoded Decode(const std::string& text, size_t room) {
   const GuardedBytes in(ToBytes(text));
   GuardedBytes out(Bytes(room, kUntouched));

@@ -11,7 +11,7 @@ using ApkTools::EntryDigests;
 
 namespace {
 
-// "ATTRIBUTE VALUE", or "none".
+// The digest of the entry `name` as "ATTRIBUTE VALUE", or "none".
 std::string Found(const EntryDigests& digests, const std::string& name) {
   std::string digest_name, digest;
   if (digests.Find(name, digest_name, digest)) return digest_name + " " + digest;
@@ -85,6 +85,8 @@ TEST(EntryDigests, OfManyEqualNamesTheLastSectionCounts) {
   EXPECT_EQ("SHA-256-Digest 0", recorded.Of("z"));
 }
 
+// A name of these letters, each followed by 63 slashes.
+//
 // The hash of a name is rotated by 9 bits before each byte. 64 rotations are 576 bits, 9 full turns
 // of the 64-bit hash. Bytes at a distance of 64 therefore enter the hash at the same place, and
 // their order does not change the hash.

@@ -184,7 +184,7 @@ TEST(VerifyEntryHash, AnEntryListedWithSha1AloneIsVerifiedWithIt) {
   EXPECT_TRUE(VerifyEntry(open, "classes.dex"));
 }
 
-// "classes.dex", listed with the digests of these contents.
+// Options for a package whose manifest lists "classes.dex" with the digests of these contents.
 PackageOptions WithDexDigests(const std::string& sha1_of, const std::string& sha256_of) {
   return WithManifest(JarText::Manifest()
                           .EndSection()

@@ -11,8 +11,8 @@
 
 using namespace ApkTools;
 
-// The linker redirects the tool's calls of mmap to the function below, also the call that checks
-// whether memory is available.
+// The linker redirects the tool's calls of mmap to the function below, including the call that
+// checks whether memory is available.
 static bool memory_is_short = false;
 
 extern "C" void* __real_mmap(void* address, size_t size, int protection, int flags, int fd,

@@ -1,6 +1,7 @@
 // The functions of the installed zip library, under names that do not conflict with either
-// generation of its header. zipstring_library.cpp includes the old header, installed_library.cpp
-// the library's own header. Result codes, lifetimes and handles are those of the library.
+// generation of its header. zipstring_library.cpp includes the old header, and
+// installed_library.cpp includes the library's own header. Result codes, lifetimes and handles are
+// those of the library.
 #pragma once
 
 #include <sys/types.h>

@@ -1,5 +1,5 @@
-// The integers, compared with GMP. Each operation gets at least 100,000 operands, made of limbs
-// that cause carries.
+// The integers, compared with GMP. Each operation gets at least 100,000 operands. Many of them are
+// made of limbs that cause carries.
 #include "crypto/mpi.h"
 
 #include <gtest/gtest.h>

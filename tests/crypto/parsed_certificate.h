@@ -7,8 +7,8 @@
 #include "support/certificate.h"
 #include "support/guarded_bytes.h"
 
-// The parser does not verify the signature, so any bytes will do. A real signature would take time
-// to make.
+// A certificate with arbitrary bytes as its signature. The parser does not verify the signature,
+// and a real signature would take time to make.
 inline Certificate Unsigned() {
   Certificate certificate;
   certificate.signature = der::BitString(Bytes(8, 0x5a));

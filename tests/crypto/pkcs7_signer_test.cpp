@@ -78,7 +78,8 @@ TEST(ProcessCertSigner, SignersThatWouldStartBeyondTheEndGiveTheUnreadableLine) 
   EXPECT_EQ(processed.output, std::string(kUnreadable) + kSignerTrailer);
 }
 
-// Each of these elements may end beyond its container, but not beyond the block.
+// The signerInfos and the first SignerInfo may each end beyond their container, but not beyond the
+// block.
 TEST(ProcessCertSigner, SignersAndTheirFirstMayEndWithTheBlock) {
   const Bytes signer = der::Sequence({der::Integer(1), der::Sequence({}), Sha256Algorithm(),
                                       AlgorithmIdentifier("1.2.3"), der::OctetString(Bytes(8, 1))});
@@ -95,8 +96,8 @@ TEST(ProcessCertSigner, SignersAndTheirFirstMayEndWithTheBlock) {
 
 TEST(ProcessCertSigner, VersionAndIssuerMayEndWithTheBlock) {
   // The SignerInfo is empty. The version and the issuer are read from the bytes after it, and the
-  // digestAlgorithm is missing. In the first and the third case, the issuer ends with the block. In
-  // the second case the version is one byte longer, and in the fourth the issuer.
+  // digestAlgorithm is missing. In the first and the third case, the issuer ends with the block.
+  // The second case has a version that is one byte longer, and the fourth case has such an issuer.
   const std::pair<const char*, const char*> cases[] = {
       {"31 00 30 00 02 03 01 02 03 30 00", kNoAlgorithm},
       {"31 00 30 00 02 04 01 02 03 30 00", kUnreadable},
@@ -131,8 +132,8 @@ TEST(ProcessCertSigner, MalformedDigestAlgorithmGivesItsLine) {
 }
 
 TEST(ProcessCertSigner, DigestAlgorithmMustEndWithinTheSignerInfo) {
-  // The same bytes four times. The SignerInfo ends one byte before the digestAlgorithm, at its
-  // start, one byte before its end, and at its end.
+  // Four blocks that differ only in the length of the SignerInfo. It ends one byte before the
+  // digestAlgorithm, at its start, one byte before its end, and at its end.
   const Bytes start = Concat({der::Integer(1), der::Sequence({})});
   const Bytes rest = Concat({AlgorithmIdentifier("1.2.3"), der::OctetString(Bytes(8, 1))});
   const size_t algorithm_end = start.size() + Sha256Algorithm().size();

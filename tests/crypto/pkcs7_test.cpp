@@ -318,7 +318,7 @@ TEST(ProcessCertKey, ExponentThatIsNotAnIntegerGivesTheIntegerLine) {
 
 TEST(ProcessCertKey, ExponentMustBeInTheBlock) {
   // The key ends after the exponent's header. The length in this header covers the rest of the
-  // block, and is not greater than the modulus's.
+  // block, and is not greater than the length of the modulus.
   SignatureBlock block =
       WithPublicKey(Concat({der::Sequence({der::Integer(Bytes(200, 0x77))}), {0x02, 0x81, 0x00}}));
   block.signer_infos = Bytes();

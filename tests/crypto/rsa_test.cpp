@@ -226,8 +226,8 @@ TEST(RsaPkcs1Verify, PaddingWithoutASeparatorIsInvalid) {
   EXPECT_EQ(log.records(), kNoRecords);
 }
 
-// The verifier recovers the longer block first, in the same place on the stack. That block has a
-// zero right after the place where the shorter block ends.
+// The verifier recovers both blocks at the same place on the stack, the longer block first. The
+// longer block has a zero right after the place where the shorter block ends.
 TEST(RsaPkcs1Verify, PaddingThatRunsToTheLastByteIsNotReadBeyondIt) {
   const FixedKey longer("rsa-2048");
   const FixedKey shorter("rsa-1024");

@@ -79,8 +79,8 @@ TEST(X509Extensions, TrueOfAnotherByteIsReadAsAnIdentifier) {
   }
 }
 
-// Read as a header, the two bytes of the flag and the OCTET STRING would be an element of the
-// private class with a good value.
+// A parser that ignored the flag's length would read FF 04 04 as the header of an element of the
+// private class. Its contents, 03 02 05 A0, are a good value.
 TEST(X509Extensions, FlagOfTwoBytesOnAnUnderstoodExtensionIsMinus15) {
   const Bytes rest = FromHex("04 03 02 05 a0");
   EXPECT_EQ(ResultOf(With({RawExtension(kKeyUsage, Concat({FromHex("01 01 04"), rest}))})), 0);
@@ -115,10 +115,10 @@ TEST(X509Extensions, MalformedExtensionIsMinus15) {
       der::Sequence({value, value}),                                    // no OID either
       RawExtension(kUnknown, {}),                                       // no value
       RawExtension(kUnknown, der::Null()),                              // another element
-      RawExtension(kUnknown, der::ContextPrimitive(4, {})),             // of another class
+      RawExtension(kUnknown, der::ContextPrimitive(4, {})),             // a value of another class
       RawExtension(kUnknown, Concat({FromHex("01 00"), value})),        // an empty flag
-      RawExtension(kUnknown, Concat({FromHex("01 02 ff ff"), value})),  // of two bytes
-      RawExtension(kUnknown, der::Boolean(0xff)),                       // no value after it
+      RawExtension(kUnknown, Concat({FromHex("01 02 ff ff"), value})),  // a flag of two bytes
+      RawExtension(kUnknown, der::Boolean(0xff)),                       // no value after the flag
       RawExtension(kKeyUsage, Concat({der::Boolean(0xff), der::Null()})),
       RawExtension(kKeyUsage, Concat({der::Boolean(0xff), {0x04, 0x05}})),
   };

@@ -12,7 +12,8 @@ namespace {
 constexpr char kEcPublicKey[] = "1.2.840.10045.2.1";
 constexpr char kPrime256v1[] = "1.2.840.10045.3.1.7";
 
-// A certificate with a value in every field, for the tests that damage a certificate.
+// A certificate with the four known extensions and an unknown one. Its issuer has an e-mail
+// address.
 Certificate Full() {
   Certificate certificate = Unsigned();
   certificate.issuer =

@@ -48,9 +48,9 @@ bool IsIn(const char* name, const void* address) {
          strstr(info.dli_fname, name) != nullptr;
 }
 
-// If memory is missing, the platform's String8 uses a null pointer, while the platform's other
-// containers abort. This handler turns that crash into an abort, so that a test can tell it from
-// every other crash.
+// If memory is missing, the platform's String8 crashes on a null pointer, while the platform's
+// other containers abort. This handler turns that crash into an abort, so that a test can tell it
+// from every other crash.
 void AbortForString8(int, siginfo_t*, void* context) {
 #ifdef __x86_64__
   const auto address = static_cast<ucontext_t*>(context)->uc_mcontext.gregs[REG_RIP];
@@ -75,7 +75,7 @@ void Arm() {
   sigaction(SIGSEGV, &action, nullptr);
 }
 
-// True if this is the call that must fail. Calls no function that could fail itself.
+// True if this is the call that must fail. Calls none of the functions that this library replaces.
 bool Fails(const char* name, int error, const void* caller = nullptr) {
   if (calls_left <= 0 || strcmp(name, function) != 0) return false;
   if (caller != nullptr && IsIn("/lib/apktoolkit/", caller)) return false;

@@ -162,7 +162,7 @@ Installed PackageWithAnotherLibrary() {
 TEST(FaultsOfCalls, OnAGoodPackageCostTheirOwnStep) {
   Installed file = GoodPackage();
   ExpectRuns(file, "LPK",
-             {{"open", {"", "PK", "PK"}},     // the package; the library to read it, to sign it
+             {{"open", {"", "PK", "PK"}},     // the package; the library, to read it and to sign it
               {"read", {"PK"}},               // the library
               {"fopen", {"PK", "LK"}},        // the tool's integrity value, before each signing
               {"fcntl", {"PK", "PK", "LK"}},  // the library kept open; both signings

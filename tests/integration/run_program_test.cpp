@@ -16,7 +16,8 @@
 
 namespace {
 
-// A shell that runs `script`. Its output goes to `file`, which is $0 in the script.
+// Runs `script` in a shell, and returns how the shell ended. The output goes to `file`, which is $0
+// in the script.
 RunResult Shell(const std::string& script, const std::string& file = "/dev/null",
                 const RunLimits& limits = {}) {
   return RunProgram({"/bin/sh", "-c", "exec >\"$0\"; " + script, file}, limits);
@@ -93,7 +94,7 @@ TEST(RunProgram, HasNullForItsStreamsAndNothingElseOpen) {
   close(inherited);
 }
 
-// A daemon may not have standard streams.
+// A daemon may run without standard streams.
 TEST(RunProgram, HasItsStreamsEvenIfThisProcessHasNone) {
   std::string streams;
   {

@@ -23,7 +23,7 @@ std::string DigestOfKey(const std::string& golden) {
   return ContentOf(Golden(golden) + "/digest").substr(0, 64);
 }
 
-// The Java side, for a phone of this API level.
+// Runs the Java side for a phone of this API level.
 ProcessResult PackageManager(int level, const std::string& apk, const Words& more = {}) {
   Words command = {JAVA_PROGRAM,          "-cp", SIGNERS_CLASSPATH, "PrintSignerDigests",
                    std::to_string(level), apk};
@@ -37,7 +37,7 @@ std::string SignersOf(const std::string& apk, int level = 33) {
   return run.output.substr(0, run.output.find('\n'));
 }
 
-// The C++ side. The command prints that it ran.
+// Runs the C++ side with a command that prints that it ran.
 ProcessResult Bound(const std::string& digests, const std::string& file) {
   return RunProcess({APKTOOLKIT_BOUND_PATH, digests, "/bin/echo", "run for", file});
 }

@@ -1,5 +1,5 @@
-// Tests the judgement of the phones' installer beside the tool's, for real packages: in the lines
-// that a person reads, and in the journal.
+// Tests how the simulator reports the judgement of the phones' installer on real packages: in the
+// lines that a person reads, and in the journal.
 #include <gtest/gtest.h>
 
 #include <filesystem>
@@ -275,7 +275,8 @@ with zipfile.ZipFile("base.apk", "a") as archive:
   EXPECT_EQ(run.output.substr(0, 17), "NOT INSTALLABLE  ") << run.output << run.errors;
 }
 
-// The verifier starts late, after the tool's run has ended. Its answer is about other bytes.
+// The verifier starts late, after the tool's run has ended. A file that changes in between has no
+// result. A new hard link to the file does not count as a change.
 TEST(Installer, FileThatChangesBeforeItsAnswerHasNoResult) {
   const TempDir directory;
   const std::string apk = directory / "base.apk";

@@ -1,4 +1,5 @@
-// JARs, which the kernel has to trust already, and other files that are no packages.
+// JARs, which are signed only if the kernel already trusts them, and other files that are not
+// packages.
 #include <fcntl.h>
 #include <gtest/gtest.h>
 #include <openssl/sha.h>

@@ -1,4 +1,4 @@
-// Tests the simulator's texts for libraries of real packages that are not signed.
+// Tests the simulator's texts for unsigned libraries of real packages.
 #include "journeys/reason.h"
 
 #include "support/package.h"

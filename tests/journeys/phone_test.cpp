@@ -31,14 +31,14 @@ class GoodPackageOn : public testing::Test {
   const std::string library_ = directory_.Write("lib/arm64/libfoo.so", ToBytes("\177ELF foo"));
 };
 
-// One refused signature. `kernels_part` has the events of the kernel before the message.
+// The events of one refused signature. `kernels_part` has those of the kernel, before the message.
 std::string Refusal(const std::string& kernels_part, int error) {
   return Timeline({Log(4, "VeltSignOat: Apk case.\n"), kernels_part,
                    Log(6, "VELT can't sign a file (result=10000, errno " + std::to_string(error) +
                               ": " + strerror(error) + ").\n")});
 }
 
-// Both signatures refused, each with its own events of the kernel.
+// The events of two refused signatures. `library_part` and `package_part` have those of the kernel.
 std::string BothRefused(const std::string& library_part, const std::string& package_part,
                         int error) {
   return Timeline({LibraryStep({Refusal(library_part, error)}),

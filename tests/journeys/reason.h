@@ -61,7 +61,7 @@ class Reason : public testing::Test {
     }
   }
 
-  // A shell command in the package's directory.
+  // Runs a shell command in the package's directory. The test fails if the command fails.
   void Do(const std::string& command) const {
     const ProcessResult run = RunProcess({"bash", "-e", "-c", command}, directory_.path());
     ASSERT_EQ(run.status, 0) << run.errors;

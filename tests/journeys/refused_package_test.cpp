@@ -15,7 +15,7 @@ namespace {
 
 const Bytes kLibrary = ToBytes("\177ELF foo");
 
-// A package that asks for the permission, and its library on disk. Each test damages one of them.
+// A package that asks for the permission, and its library on disk. Each test changes one of them.
 class RefusedPackage : public testing::Test {
  protected:
   explicit RefusedPackage(const PackageOptions& options = Options())

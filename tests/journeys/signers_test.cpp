@@ -83,7 +83,8 @@ TEST(Schemes, AreThoseThatTheFileCarries) {
   EXPECT_EQ(LineWith(Told("jarsigner-sha256"), "schemes:"), "    schemes: v1");
 }
 
-// The digest of the key that the kernel gets differs from the one that other programs print.
+// The kernel gets the digest of the modulus alone. Other programs print the digest of the whole
+// public key.
 TEST(KernelsDigest, IsThatOfTheModulusAlone) {
   const ProcessResult modulus = RunProcess({"cat", Golden("apksigner-sha256-2048/digest")});
   EXPECT_EQ(LineWith(Told("apksigner-sha256-2048"), "modulus SHA-256") + "\n",

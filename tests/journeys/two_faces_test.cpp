@@ -1,5 +1,6 @@
-// Packages for which other programs read another signer than the tool does. Wherever the simulator
-// names a key, it is the key that the kernel got. The line of the verdict contains an alarm.
+// Packages that other programs read differently than the tool, for example with another signer.
+// Wherever the simulator names a key, it is the key that the kernel got. The line of the verdict
+// contains the alarms.
 #include <gmpxx.h>
 #include <gtest/gtest.h>
 #include <openssl/mem.h>
@@ -56,8 +57,9 @@ Package SignedAgain(Package package, Certificate certificate, const OwnKey& key)
 }
 
 // The certificate shows the victim's modulus. An exponent of eight bytes makes the tool read 300
-// bytes from the start of this modulus as its modulus. The last of them are bytes of an extension,
-// chosen so that the number is a prime. The author of the package can sign for a prime modulus.
+// bytes, from the start of this modulus, as the modulus of its key. The last of these bytes belong
+// to an extension, and are chosen so that the number is a prime. The author of the package can sign
+// for a prime modulus. Sets `*digest` to the SHA-256 digest of this prime.
 Package WithAPrimeBehindTheVictimsModulus(std::string* digest) {
   constexpr size_t kSize = 300;
   Certificate certificate;
@@ -94,7 +96,8 @@ Package WithAPrimeBehindTheVictimsModulus(std::string* digest) {
   return SignedAgain(MakePackage(), certificate, key);
 }
 
-// Two zero bytes are before the modulus. One of them stays in the tool's key and in its digest.
+// Two zero bytes are before the modulus. One of them stays in the tool's key, and in the key's
+// digest, which is set in `*digest`.
 Package WithAZeroBeforeTheModulus(std::string* digest) {
   const RSA* const rsa = TestRsaKey("rsa-2048");
   const auto number = [](const BIGNUM* from) {
@@ -111,8 +114,8 @@ Package WithAZeroBeforeTheModulus(std::string* digest) {
   return SignedAgain(MakePackage(), certificate, key);
 }
 
-// All that the simulator reports about a package: the line of the verdict, the text, the journal's
-// verdict and the page.
+// All that the simulator reports about a package: the exit status, the line of the verdict, the
+// text, the page and the journal's verdict.
 struct Told {
   explicit Told(const Package& package, const std::vector<std::string>& options = {})
       : Told(package.Build(), options) {}

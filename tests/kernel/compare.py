@@ -112,8 +112,8 @@ def last_payloads(kernel, all_runs):
 
 def check_disk(kernel, files, all_runs):
     """Checks that the disk keeps the digest and the payload of each signed file. e2fsprogs reads
-    both. A run changes changed.jar after it was signed, so its digest must differ from the file's.
-    Returns the number of signed files."""
+    both. A run changes changed.jar after it was signed, so the kept digest must differ from the
+    file's. Returns the number of signed files."""
     payloads = last_payloads(kernel, all_runs)
     with tempfile.TemporaryDirectory() as name:
         directory = pathlib.Path(name)

@@ -1,5 +1,6 @@
 // Lists a manifest whose sections are not sorted, and finds one section. With the argument "hash",
-// computes the C++ library's hash of the text instead, which must be trapped.
+// computes the C++ library's hash of the text instead. This hash overflows, so the trap must end
+// the program.
 #include <cstdio>
 #include <functional>
 #include <string>

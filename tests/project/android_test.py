@@ -1,6 +1,6 @@
 #!/usr/bin/env python3
-"""Runs scripts/android on objects that call functions which API level 27 lacks, and on one that
-does not."""
+"""Runs scripts/android on objects that call functions which API level 27 lacks, and on objects that
+do not."""
 
 import pathlib
 import subprocess
@@ -9,8 +9,7 @@ import tempfile
 
 from sources import ROOT, report
 
-# Functions of later API levels. Each declaration has the name that scripts/android prints, and a
-# call.
+# Functions of later API levels: the declaration, the name that scripts/android prints, and a call.
 LATER = {
     "int memfd_create(const char*, unsigned);": ("memfd_create", 'memfd_create("", 0)'),
     "long getrandom(void*, unsigned long, unsigned);": ("getrandom", "getrandom(0, 0, 0)"),
@@ -45,15 +44,15 @@ def main():
             problems.append(f"functions that the API level has are refused: {result.stdout}")
         result = compare(good)
         if result.returncode != 1 or f"Own called by {good}\n" not in result.stdout:
-            problems.append(f"a function that is nowhere is not noticed: {result.stdout}")
+            problems.append(f"a call of a function that no object defines is not noticed: {result.stdout}")
         for declaration, (symbol, call) in LATER.items():
             bad = compiled(directory, "bad", f"{declaration} int Later() {{ return {call}; }}")
             result = compare(good, own, bad)
             if result.returncode != 1 or symbol not in result.stdout or "read" in result.stdout:
                 problems.append(f"{symbol} is not noticed: {result.stdout}")
         if compare().returncode == 0:
-            problems.append("a call without objects succeeds")
-    return report(problems, "scripts/android: its function compare")
+            problems.append("scripts/android --symbols succeeds without objects")
+    return report(problems, "the function compare in scripts/android")
 
 
 if __name__ == "__main__":

@@ -69,7 +69,7 @@ def main():
                 problems.append(f"unprotected branches are not noticed: {result.stdout}")
         for files in ((), (directory / "missing",)):
             if check(*files).returncode == 0:
-                problems.append(f"{files} are taken for hardened files")
+                problems.append(f"the files {files} are accepted as hardened")
     return report(problems, "scripts/check-binary")
 
 

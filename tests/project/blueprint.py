@@ -102,7 +102,7 @@ class Tree:
         return merged
 
     def include_directories(self, module):
-        """The directories of its headers: its own, and those that its static libraries export."""
+        """The module's own include directories, and those that its static libraries export."""
         own = [module["directory"] / name for key in ("local_include_dirs", "export_include_dirs")
                for name in module.get(key, [])]
         return own + [library["directory"] / name

@@ -71,7 +71,7 @@ def main():
     compare("CMakeLists.txt and the tool's directories", map(str, tool_sources()),
             sum(map(cmake_sources, ("apktoolkit_core", "apktoolkit", "apktoolkit-verify", "zu")), []), problems)
     there = {str(path.relative_to(ROOT)) for path in ROOT.glob("fuzz/*_fuzz.cpp")}
-    compare("WORKSTATION_ONLY or fuzz/cc_fuzz.bp, and the files,", {*WORKSTATION_ONLY, *fuzz.all_sources("cc_fuzz")},
+    compare("the files, and WORKSTATION_ONLY with fuzz/cc_fuzz.bp", {*WORKSTATION_ONLY, *fuzz.all_sources("cc_fuzz")},
             {"fuzz/quiet_log.cpp", *there, *(path for path in WORKSTATION_ONLY if (ROOT / path).exists())}, problems)
     hold_flags(platform, problems)
     hold_wraps(tests, problems)
@@ -105,7 +105,7 @@ def hold_flags(platform, problems):
     presets = json.loads((ROOT / "CMakePresets.json").read_text())["configurePresets"]
     base = next(preset for preset in presets if preset["name"] == "base")
     if base["cacheVariables"].get("CMAKE_COMPILE_WARNING_AS_ERROR") != "ON":
-        problems.append("warnings are no errors in the developers' presets")
+        problems.append("the preset base does not set CMAKE_COMPILE_WARNING_AS_ERROR to ON")
 
 
 def hold_wraps(tests, problems):
@@ -116,7 +116,7 @@ def hold_wraps(tests, problems):
     for module in (module for module in tests.modules if module["type"] == "cc_test"):
         name = module["name"]
         target = "phone" if name in MORE else name.replace("apktoolkit_", "")
-        compare(f"what is wrapped for {name}", re.findall(r"--wrap=(\w+)", str(module.get("ldflags"))),
+        compare(f"functions wrapped for {name}", re.findall(r"--wrap=(\w+)", str(module.get("ldflags"))),
                 wrapped.get(target, []), problems)
 
 
@@ -128,7 +128,7 @@ def hold_words(platform, tests, problems):
         if module.get("cpp_std", "c++1z") != "c++1z":
             problems.append(f"{module['name']}: Android 8.1 does not know {module['cpp_std']}")
     # Android 8.1 reads only the named blueprints. Later releases read all that they find.
-    compare("blueprints below the first", platform.variables["subdirs"],
+    compare("the blueprints below Android.bp", platform.variables["subdirs"],
             [path.parent.name for path in ROOT.glob("*/Android.bp")], problems)
 
 

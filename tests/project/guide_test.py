@@ -2,8 +2,8 @@
 """Runs the commands that docs/guide.md shows, and writes their output to the page.
 
 Arguments: the directory of the golden packages, and the command line that starts apktoolkit-sim. A
-last line of three dots on the page stands for the lines that follow. A command may print anything
-if the page shows only this line.
+last line of three dots on the page stands for the lines that follow. If the page shows only this
+line below a command, the command may print anything.
 """
 
 import pathlib

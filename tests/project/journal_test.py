@@ -72,7 +72,7 @@ def main():
         for member in event:
             poorer = {key: value for key, value in event.items() if key != member}
             if validator.is_valid(poorer):
-                problems.append(f"the schema takes {poorer} without {member}")
+                problems.append(f"the schema accepts {poorer}, although {member} is missing")
     return report(problems, "docs/journal.schema.json; for a new event or verdict, also runs() in tests/project/journal_test.py")
 
 

@@ -116,7 +116,7 @@ def reasons_problems(rows, messages):
         may_hold = row["group"] in UNBROKEN or row["group"] == "kLibrary" or is_absent
         if row["link"] == "kNone" and not may_hold and row["group"] != "kTool":
             problems.append(f"{name} breaks no link of the chain")
-        problems += [f"{name}: no message {text}" for text in re.findall(r"`([^`]+)`", row["log"])
+        problems += [f"{name}: the tool has no message {text}" for text in re.findall(r"`([^`]+)`", row["log"])
                      if not any(text in message for message in messages)]
     return problems
 

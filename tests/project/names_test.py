@@ -1,6 +1,6 @@
 #!/usr/bin/env python3
-"""Checks that what the docs name exists: the tests, the linked files, and each function that
-docs/architecture.md names in a file."""
+"""Checks names in the docs. The named tests, the linked files, and the files and functions that
+docs/architecture.md names must exist."""
 
 import re
 import sys
@@ -18,7 +18,7 @@ LINK = re.compile(r"\]\(([^)#:]+)(?:#[^)]*)?\)")
 
 PAGE = ROOT / "docs/architecture.md"
 PATH = r"\w[\w/]*/\w+\.(?:cpp|h|md|py)"
-# The page names a function and its file in three places: a stop of the picture, a row of the table,
+# The page names a function and its file in three places: a step of the picture, a row of the table,
 # and an answer.
 STOP = re.compile(rf"^[ |:v]*([\w:]+) +({PATH})", re.M)
 ROW = re.compile(rf"^\|[^|]*\| ([^|]*) \| ((?:`{PATH}`(?:, )?)+) \|$", re.M)
@@ -51,7 +51,7 @@ def test_and_link_problems():
                 yield f"{page.relative_to(ROOT)}: there is no test {suite}.{test}"
         for link in LINK.findall(text):
             if not (page.parent / link).exists():
-                yield f"{page.relative_to(ROOT)} links {link}, which is not there"
+                yield f"{page.relative_to(ROOT)} links to {link}, which does not exist"
     if count < 50:
         yield f"only {count} tests are named: the pattern NAMED misses them"
 
@@ -77,4 +77,4 @@ def function_problems():
 
 if __name__ == "__main__":
     sys.exit(report([*test_and_link_problems(), *function_problems()],
-                    "the page that is named: write there what the sources have now"))
+                    "the page named above: it must name only what exists"))

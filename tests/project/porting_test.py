@@ -33,7 +33,7 @@ INTERFACE = (
 
 def interface_problems():
     facts = ((path, text, re.search(pattern, (ROOT / path).read_text())) for path, pattern, text in INTERFACE)
-    return [f"docs/porting.md does not say {text!r} as {path} has it: {fact and fact[0]}"
+    return [f"docs/porting.md does not have the text {text!r} with the value in {path}: {fact and fact[0]}"
             for path, text, fact in facts if not fact or text.format(fact[1]) not in PAGE]
 
 

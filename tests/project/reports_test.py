@@ -152,7 +152,7 @@ def main():
                      for artifact in log["runs"][0]["artifacts"]]
             for file in some:
                 if str(file).encode(errors="surrogateescape") not in paths:
-                    problems.append(f"{file!r} is no artifact")
+                    problems.append(f"the log has no artifact for {file!r}")
         if seen != {0, 1, 3, 4}:
             problems.append(f"the statuses are {seen}, and not 0, 1, 3 and 4")
     return report(problems)

@@ -106,7 +106,7 @@ def run_and_kill(shell, command):
     done = shell.journals()
     problems = [f"the journal {name} is not whole" for name in done if not is_whole(shell, name)]
     if not 0 < len(done) < LISTS:
-        problems.append(f"{len(done)} of {LISTS} lists were done when it was killed")
+        problems.append(f"{len(done)} of {LISTS} lists were done when the work was killed")
     return problems
 
 
@@ -129,7 +129,7 @@ def cut_journal_problems(shell):
     process = shell.start("./check-batch 000000")
     _, errors = process.communicate()
     if process.returncode == 0 or "000000" in shell.journals():
-        return [f"a cut journal ends with {process.returncode}: {errors}"]
+        return [f"the job with a cut journal ends with {process.returncode}: {errors}"]
     return []
 
 

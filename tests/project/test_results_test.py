@@ -53,7 +53,7 @@ def main():
             results.flush()
             run = subprocess.run([ROOT / "scripts/test-results", results.name], capture_output=True, text=True)
         if (run.stdout.splitlines(), run.returncode) != (expected, status):
-            problems += [f"in place of {expected} and {status}: {run.returncode}", run.stdout, run.stderr]
+            problems += [f"status {run.returncode}, expected {status} and {expected}:", run.stdout, run.stderr]
     return report(problems, "scripts/test-results")
 
 

@@ -28,7 +28,7 @@ def always(assumptions, *claims):
     solver.add(*assumptions)
     solver.add(z3.Not(z3.And(*claims)))
     if solver.check() != z3.unsat:
-        raise AssertionError(f"not for {solver.model()}")
+        raise AssertionError(f"the claim does not hold for {solver.model()}")
 
 
 def is_same(a, b):
@@ -140,9 +140,8 @@ class Montgomery:
 
 def windows_make_up_the_exponent():
     """After every window, and after every zero between windows, the scan is in its first state
-    again. The exponents that are checked here contain each window of up to 6 bits, with every
-    possible gap to the next window. They therefore stand for all exponents. Some windows cross
-    limbs."""
+    again. The exponents that are checked here contain each pair of windows, with and without a
+    zero between them. They therefore stand for all exponents. Some windows cross limbs."""
     function = load("crypto/mpi_pow_mod.cpp", "raise", kMpiLimbBits=LIMB_BITS,
                     mpi_msb=lambda number: number.value.bit_length())
     for w in (1, 3, 4, 5, 6):
@@ -175,7 +174,7 @@ def line_outside_the_dialect_is_named():
             except Unread as error:
                 assert f"{source.name}:3: `{line}`" in str(error), error
             else:
-                raise AssertionError(f"{line} is read")
+                raise AssertionError(f"`{line}` was translated without an error")
 
 
 PROOFS = (line_outside_the_dialect_is_named,

@@ -90,7 +90,8 @@ def expand(level, defines, parts):
 
 
 def compiled(directory, level, parts, more=""):
-    """The policy in CIL, or the compiler's error; `more` are further rules."""
+    """Returns the policy in CIL and an empty text, or None and the compiler's error. `more` has further
+    rules."""
     text = directory / "policy.conf"
     rules = expand(level, LEVELS[level][0], [HERE / "platform.conf", *parts])
     text.write_text(rules + more + (HERE / "platform_end.conf").read_text())
@@ -145,7 +146,7 @@ def check(directory, level):
             continue
         problems += difference(name, grants(cil), wanted(listed, unknown))
         if ("typeattributeset system_file_type" in cil) == ("system_file_type" in unknown):
-            problems.append(f"{name}: system_file_type is used where there is none, or not where there is")
+            problems.append(f"{name}: system_file_type must be used exactly at the levels that know it")
         labels = run("setfiles", "-c", directory / "policy", KIT / "file_contexts")
         if labels.returncode != 0:
             problems.append(f"{name}: file_contexts: {labels.stdout}")

@@ -289,7 +289,7 @@ TEST_F(ChangedLibrary, ThatIsLeasedAtItsSecondOpeningIsSigned) {
     return path == target_ && ++asked == 2 ? EWOULDBLOCK : 0;
   };
   ExpectSigned(1);
-  EXPECT_EQ(asked, 3);  // the third pins the file (O_PATH); a fourth opens its link in /proc
+  EXPECT_EQ(asked, 3);  // the third pins the file (O_PATH); its link in /proc is not counted
 }
 
 // Before the tool opens the file again, the holder of the lease could put another file in its

@@ -37,8 +37,8 @@ std::string RegisterPackage(int fd) {
   return "register " + std::to_string(fd) + " com.example.app " + Hex(ModulusOf("rsa-2048"));
 }
 
-// The event with four SHA-256 digests by libcrypto. The first is the digest of the path. Each other
-// one is the digest of the one before it.
+// The event with four SHA-256 digests by libcrypto. The first is the digest of the path. Each later
+// digest is the digest of the previous digest.
 std::string RegisterJar(int fd, const std::string& path) {
   uint8_t block[4 * SHA256_DIGEST_LENGTH];
   SHA256(reinterpret_cast<const uint8_t*>(path.data()), path.size(), block);

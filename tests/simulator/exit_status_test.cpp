@@ -82,8 +82,8 @@ TEST(ExitStatus, ThreeWhenTheVerifierDoesNotEnd) {
   EXPECT_EQ(result.status, 3);
 }
 
-// Reading a pipe waits for a writer, and a device has no end. With --state, the simulator reads
-// neither of them.
+// Reading a pipe waits for a writer, and a device has no end. Even with --state, the simulator
+// reads neither of them.
 TEST(ExitStatus, OneForADeviceOrAPipe) {
   const TempDir directory;
   const std::string pipe = directory / "pipe";

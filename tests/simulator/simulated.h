@@ -20,7 +20,7 @@ inline ProcessResult Simulated(Lines words) {
   return Told(words);
 }
 
-// The first lines of what is printed.
+// The first `count` lines of the output.
 inline Lines FirstLines(const ProcessResult& result, size_t count) {
   Lines lines = LinesOf(result.output);
   lines.resize(std::min(lines.size(), count));

@@ -26,8 +26,9 @@ Bytes SignWith(const std::string& key, Digest digest, const Bytes& data);
 Bytes EncodedMessage(Digest digest, const Bytes& data, size_t size);
 // An AlgorithmIdentifier with NULL or the given parameters.
 Bytes AlgorithmIdentifier(const std::string& oid, const Bytes& parameters = der::Null());
-// A SubjectPublicKeyInfo of the test key, and one with any RSAPublicKey or other contents.
+// The SubjectPublicKeyInfo of the test key.
 Bytes PublicKeyInfo(const std::string& key);
+// A SubjectPublicKeyInfo for RSA around any contents, such as an RSAPublicKey.
 Bytes PublicKeyInfoAround(const Bytes& public_key);
 
 // A Name with one attribute for each pair of object identifier and text, as UTF8Strings.

@@ -25,7 +25,7 @@ inline constexpr char kAndroidNamespace[] = "http://schemas.android.com/apk/res/
 XmlAttribute StringAttribute(const std::string& name, const std::string& text);
 XmlAttribute ReferenceAttribute(const std::string& name, uint32_t resource);
 XmlAttribute IntAttribute(const std::string& name, uint32_t value);
-// Its typed value says "string", but its raw value is missing.
+// An attribute whose typed value has the type string, but whose text is missing.
 XmlAttribute StringAttributeWithoutText(const std::string& name);
 // The same attribute in Android's namespace.
 XmlAttribute InAndroidNamespace(XmlAttribute attribute);

@@ -33,9 +33,9 @@ Bytes Element(uint8_t identifier, const std::string& contents);
 
 Bytes Sequence(const std::vector<Bytes>& elements);
 Bytes Set(const std::vector<Bytes>& elements);
-// An element with the context-specific tag [number]: constructed, and primitive as for an IMPLICIT
-// string.
+// A constructed element with the context-specific tag [number].
 Bytes Context(uint8_t number, const Bytes& contents);
+// The same element, but primitive, as for an IMPLICIT string.
 Bytes ContextPrimitive(uint8_t number, const Bytes& contents);
 
 Bytes Boolean(uint8_t value);
@@ -45,8 +45,9 @@ Bytes Integer(const Bytes& contents);
 Bytes BitString(const Bytes& contents, uint8_t unused_bits = 0);
 Bytes OctetString(const Bytes& contents);
 Bytes Null();
-// The OBJECT IDENTIFIER with this dotted text: the whole element, and its contents alone.
+// The OBJECT IDENTIFIER with this dotted text.
 Bytes Oid(const std::string& dotted);
+// Only the contents of this element.
 Bytes OidContents(const std::string& dotted);
 
 }  // namespace der

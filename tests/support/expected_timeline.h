@@ -15,9 +15,10 @@ std::string Log(int priority, const std::string& text);
 std::string Integrity(const std::string& text);
 // The same, but there was no such file.
 std::string IntegrityMissing();
-// The tool asked the kernel to sign the open file `fd`. A refusal is an errno value.
+// The tool asked the kernel to sign the open file `fd`. `refusal` is the errno of the kernel's
+// refusal; 0: the kernel signed.
 std::string Sign(int fd, const std::string& path, const Bytes& payload, int refusal = 0);
-// The tool asked the kernel to verify the open file `fd`.
+// The tool asked the kernel to verify the open file `fd`. `refusal` 0: the kernel trusts it.
 std::string Verify(int fd, const std::string& path, int refusal = 0);
 // The tool asked libzu to register `data` under `name`.
 std::string Register(int fd, const std::string& path, const std::string& name, const Bytes& data,

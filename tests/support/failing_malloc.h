@@ -1,8 +1,8 @@
 // Makes one chosen allocation fail, and checks memory that is freed.
 //
-// A test program linked with -Wl,--wrap=malloc,--wrap=free sends the calls of its own objects here,
-// and this file calls the real functions. The platform's libraries and the sanitizers call the real
-// functions directly.
+// A test program linked with -Wl,--wrap=malloc,--wrap=free sends the calls of its own object files
+// here, and this file calls the real functions. The platform's libraries and the sanitizers call
+// the real functions directly.
 #pragma once
 
 #include <cstddef>
@@ -23,9 +23,9 @@ class FailingMalloc {
   bool failed() const { return failing_call_ != 0 && calls_ >= failing_call_; }
   // The number of blocks that were returned and not yet freed.
   int live() const;
-  // The number of blocks that were freed, and of those that had bytes other than zero when they
-  // were freed.
+  // The number of blocks that were freed.
   int freed() const { return freed_; }
+  // The number of freed blocks that still had bytes other than zero.
   int freed_unwiped() const { return freed_unwiped_; }
 
   // For the wrapped functions.

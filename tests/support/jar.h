@@ -7,7 +7,7 @@
 
 #include "support/der.h"
 
-// The standard alphabet, with padding.
+// Returns the data in base64, in the standard alphabet and with padding.
 std::string Base64Encode(const Bytes& data);
 
 // The digest of the data in base64, by `attribute`: "MD5-Digest", "SHA1-Digest" or
@@ -37,7 +37,7 @@ class JarText {
   std::string text_;
 };
 
-// The signature file over this manifest, with a "-Digest-Manifest" for each of the digest
-// attributes.
+// The text of the signature file for this manifest, with one attribute "…-Digest-Manifest" for each
+// digest attribute in `attributes`.
 std::string SignatureFileText(const std::string& manifest,
                               const std::vector<std::string>& attributes);

@@ -20,5 +20,5 @@ std::string TestKeyPath(const std::string& name);
 // The key `name`, loaded once and kept for the life of the program. Aborts if it does not exist.
 EVP_PKEY* TestKey(const std::string& name);
 
-// The same, as an RSA key.
+// The key `name` as an RSA key; null if it is another kind of key.
 RSA* TestRsaKey(const std::string& name);

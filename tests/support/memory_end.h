@@ -6,8 +6,9 @@
 
 #include <cstddef>
 
-// Puts the next block of exactly `size` bytes (at most 1 MiB) from operator new at the end of
-// memory. Up to 3 bytes may follow it, to a multiple of 4. One block at a time.
+// The next call of operator new for exactly `size` bytes (at most 1 MiB) returns a block at the end
+// of memory. Up to 3 bytes follow the block, because it starts at a multiple of 4. Only one such
+// block may be in use at a time.
 void PutNextBlockAtMemoryEnd(size_t size);
 // True if the block was put there. If not, forgets the request.
 bool WasPutAtMemoryEnd();

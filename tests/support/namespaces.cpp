@@ -6,7 +6,8 @@
 
 namespace {
 
-// A mount namespace of its own. Users other than root also need a user namespace.
+// Returns the options of unshare for a new mount namespace. Users other than root also need a user
+// namespace.
 const char* Namespaces() { return geteuid() == 0 ? "-m" : "-Urm"; }
 
 }  // namespace

@@ -73,7 +73,7 @@ class Operands {
   std::mt19937 random_;
 };
 
-// The arguments of an operation X op= A, B that are the same number.
+// The arguments of an operation X = A op B that are the same number.
 enum Alias { kNone, kXIsA, kXIsB, kAIsB, kAllOne, kAliases };
 
 struct Aliased {

@@ -2,8 +2,8 @@
 // signature block.
 //
 // A package is made in steps, so that a test can change it between them. `MakePackage` signs;
-// `Package` gives access to every entry, to tamper with it, remove it or add one; `Build` or
-// `WriteTo` makes the archive.
+// `Package` has the entries, which a test can change, remove or add; `Build` or `WriteTo` makes the
+// archive.
 #pragma once
 
 #include <functional>
@@ -30,7 +30,8 @@ struct PackageOptions {
   std::vector<ZipItem> entries = {{"classes.dex", ToBytes("dex\n035")},
                                   {"lib/arm64-v8a/libfoo.so", ToBytes("\177ELF foo")}};
 
-  // Digest attributes of the manifest's sections, and of the signature file without "-Manifest".
+  // The names of the digest attributes in the manifest's sections and in the signature file. The
+  // latter names get the suffix "-Manifest".
   std::vector<std::string> digests = {"SHA-256-Digest"};
   std::vector<std::string> signature_file_digests = {"SHA-256-Digest"};
   // The names of the signature file and of its block, without ".SF" and ".RSA".

@@ -73,7 +73,7 @@ signer_modulus() {
   openssl x509 -in "$1" -noout -modulus | sed 's/^Modulus=//'
 }
 
-# modulus_digest CERTIFICATE: the SHA-256 digest of that modulus's bytes.
+# modulus_digest CERTIFICATE: the SHA-256 digest of the modulus of the certificate's key.
 modulus_digest() {
   signer_modulus "$1" | basenc --base16 -d | openssl dgst -sha256 -r | cut -d' ' -f1
 }

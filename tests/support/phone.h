@@ -3,7 +3,7 @@
 //
 // A program that links this file must have the linker wrap open, read, fcntl, fopen, usleep,
 // fgetxattr and readlink, and the checked forms of open, read and readlink (target `phone` does
-// that). Its tests then set up a Phone, and read the results from it. While no Phone lives, every
+// that). Its tests then set up a Phone, and read the results from it. While no Phone exists, every
 // wrapped call goes to the real system, and libzu refuses.
 #pragma once
 

@@ -15,7 +15,7 @@ struct SignatureBlock {
   // The signer's key, and the digest that it signs.
   std::string key = "rsa-2048";
   Digest digest = Digest::kSha256;
-  // The key that issued the signer's certificate; empty: the signer's own.
+  // The key that issued the signer's certificate; empty: the signer's own key.
   std::string issuer_key;
   // The serial number that names the signer; unset: the serial number of the signer's certificate.
   std::optional<Bytes> serial;
@@ -44,5 +44,5 @@ struct SignatureBlock {
 
 // A block over the signature file that anyone can make without the private half of the RSA test key
 // `victim`. It has encoded messages in place of signatures. They count as signatures if the public
-// operation, with these contents of the exponent INTEGER, returns its argument.
+// operation returns its argument. `exponent` is the contents of the exponent INTEGER.
 Bytes ForgedBlock(const Bytes& signature_file, const std::string& victim, const Bytes& exponent);

@@ -27,5 +27,5 @@ Bytes SigningBlockBytes(const std::vector<std::pair<uint32_t, Bytes>>& pairs);
 Bytes ArchiveWithBlock(const Bytes& archive, const Bytes& block, const std::string& comment = "");
 
 // The archive, signed with scheme v2 by the RSA test key `key`: the block covers all bytes of the
-// file but its own. The archive must have neither a block nor a comment.
+// file except its own. The archive must have neither a block nor a comment.
 Bytes AddSigningBlock(const Bytes& archive, const std::string& key);

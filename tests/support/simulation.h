@@ -15,7 +15,7 @@ struct Simulation {
 // simulation itself fails or writes anything to standard error.
 Simulation Simulate(const std::string& file, const std::vector<std::string>& options = {});
 
-// The same with more control: the whole command before the simulator's options, and the directory.
+// The same, with words before the simulator's command and with a working directory.
 struct Start {
   std::vector<std::string> before;  // such as {"unshare", "-m"}
   std::string directory;
@@ -23,8 +23,8 @@ struct Start {
 Simulation Simulate(const std::string& file, const std::vector<std::string>& options,
                     const Start& start);
 
-// Runs the simulator with these words in the directory of `start`, in a locale of UTF-8. Returns
-// the first `count` lines of its output, and its exit status as a last line "-> STATUS".
+// Runs the simulator with these words in the directory of `start`, in a UTF-8 locale. Returns the
+// first `count` lines of its output, and its exit status as a last line "-> STATUS".
 std::vector<std::string> FirstLines(size_t count, const std::vector<std::string>& words,
                                     const Start& start);
 

@@ -11,7 +11,7 @@
 
 #include "support/der.h"
 
-// The values that one of the three places states about an entry's data.
+// The values that a header or the data descriptor states about an entry's data.
 struct ZipClaim {
   std::optional<uint32_t> crc;
   std::optional<uint32_t> compressed_length;

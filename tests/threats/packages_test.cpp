@@ -96,7 +96,7 @@ TEST(OwnMetaInf, GetsItsOwnPayload) {
             AllSignedAndRegistered(signed_again, "rsa-2048-other", "com.example.vault"));
 }
 
-// ---- Only the local names of attributes are compared.
+// ---- The tool compares only the local names of attributes.
 
 // The installer reads the name com.evil.reader. The package requests no permission: it declares
 // one.

@@ -73,8 +73,9 @@ TEST(Threat, OfTwoSignersTheFirstCertificateAndTheFirstSignatureCount) {
   }
 }
 
-// Four bytes follow the modulus. The exponent's fifth to eighth bytes set the length of the modulus
-// to the old value: 256, 00 01 00 00 in host byte order. Other readers see a key of 2080 bits.
+// Four bytes follow the modulus. The exponent's fifth to eighth bytes, 00 01 00 00, are 256 in host
+// byte order. They set the length of the modulus back to 256 bytes. Other readers see a key of 2080
+// bits.
 TEST(Threat, AModulusWithJunkBehindItIsTheKeyThatItStartsWith) {
   Package package = MakePackage();
   Certificate certificate;
@@ -117,8 +118,9 @@ TEST(Threat, DotsInAnEntryNameSignNoFileOutsideWithOtherBytes) {
   EXPECT_EQ(device.FilesSignedFor("rsa-2048"), Strings({"app/base.apk"}));
 }
 
-// The name of the program does not end in ".so". The attacker knows the program's bytes, and the
-// manifest lists their digest.
+// Expects that the program is signed through the link that `lead` makes. The name of the program
+// does not end in ".so". The attacker knows the program's bytes, and the manifest lists their
+// digest.
 void ExpectProgramSigned(const std::function<int(const char* program, const char* name)>& lead) {
   Device device(MakePackage(WithLibrariesNamed({"lib/arm64-v8a/../../../mine/libx.so"})));
   device.Install("lib/arm64/x", {}).Install("../mine/x", {}).Install("../system/program", kLibrary);
@@ -230,7 +232,7 @@ TEST(Threat, ADamagedLibraryEndsTheWalkAndIntactOnesBehindItStayUnsigned) {
 
 // ---- Files that are written to during the run.
 
-// The files that are signed, and their bytes at that moment.
+// Runs the steps. Returns the path of each signed file, and its bytes when it was signed.
 std::map<std::string, std::string> BytesSigned(Device& device) {
   std::map<std::string, std::string> signed_bytes;
   device.phone.witness = [&](int fd, const std::string& event) {

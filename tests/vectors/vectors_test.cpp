@@ -187,7 +187,8 @@ TEST(Vectors, OfWycheproofFor3072BitsAreJudgedAsTheySay) {
   EXPECT_EQ(JudgeFile(VECTORS_DIR "/wycheproof_3072_sha256.json"), Of(8, 2, 0, 247, 2));
 }
 
-// The files in the configured directory. If no directory is configured, there are no such tests.
+// The names, without extension, of the files rsa_signature_* in the configured directory. Empty if
+// no directory is configured.
 std::vector<std::string> NamesInTheDirectory() {
   std::vector<std::string> names;
   const std::filesystem::path directory = WYCHEPROOF_DIR;

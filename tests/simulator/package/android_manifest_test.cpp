@@ -29,12 +29,13 @@ std::optional<bool> Extracts(const std::vector<XmlAttribute>& attributes,
   return ParseAndroidManifest(xml.Build()).extracts_libraries;
 }
 
-// Makes every offset of the pool lead to the longest string. Together, the strings are then about
-// 90 times as long as the document: 203 strings of 5000 bytes, and a document of 11244 bytes.
+// Returns the document with every offset of its pool leading to the longest string. Together, the
+// strings are then about 90 times as long as the document: 203 strings of 5000 bytes, and a
+// document of 11244 bytes.
 Bytes WithStringsInOneAnother(Bytes bytes) {
   constexpr size_t kPool = 8;          // after the document's header
   constexpr size_t kOffsets = 8 + 28;  // after the pool's header
-  // The long string is the one after which the next offset is more than 5000 bytes larger.
+  // The next string starts more than 5000 bytes after the start of the longest string.
   const auto number = [&bytes](size_t at) {
     return bytes[at] | bytes[at + 1] << 8 | bytes[at + 2] << 16 | bytes[at + 3] << 24;
   };

@@ -186,7 +186,8 @@ TEST(CertificateFacts, BytesBehindItDoNotCount) {
   EXPECT_EQ(ParseCertificate(View(der))->sha256, digest);
 }
 
-// The expected texts are the owners that keytool prints. keytool uses the JDK's own class.
+// The expected texts are the owners that keytool prints. keytool writes names with a class of the
+// JDK.
 TEST(NameText, IsWhatTheJdkWrites) {
   const std::vector<Bytes> names = {
       Name({{"2.5.4.6", "AB"},

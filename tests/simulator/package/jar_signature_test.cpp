@@ -92,18 +92,19 @@ TEST(ToolKey, OfAnEcKeyIsNone) {
   EXPECT_EQ(jar.certificate->key.algorithm, "EC");
 }
 
-// A strict reader must find the certificate at the place where the tool read the key.
+// If the tool can read the block, the certificate is shown only if a strict reader finds the same
+// certificate.
 TEST(JarSignatureFacts, CertificateThatTheToolDoesNotReadIsNotShown) {
   Package package = MakePackage();
   Bytes& block = package.Item("META-INF/CERT.RSA").data;
-  // The length of the certificates takes four bytes and is not minimal, which DER forbids.
   const JarSignatureFacts before = SignatureOf(package);
   ASSERT_TRUE(before.certificate.has_value());
   ASSERT_TRUE(before.block.is_whole);
   const Bytes certificate = SignatureBlock().SignerCertificate().Build();
   const auto at = std::search(block.begin(), block.end(), certificate.begin(), certificate.end());
   ASSERT_NE(at, block.end());
-  // A0 82 hh ll becomes A0 83 00 hh ll. The lengths of the elements around it are then wrong.
+  // A0 82 hh ll becomes A0 83 00 hh ll: a length that is not minimal, which DER forbids. The
+  // lengths of the elements around it are then wrong.
   const auto inserted = block.insert(at - 2, 0);
   *(inserted - 1) = 0x83;
   const JarSignatureFacts jar = SignatureOf(package);

@@ -71,7 +71,8 @@ const void* Memory(const std::string& word) {
   return bytes.data();
 }
 
-// Reads the number in the file and closes it.
+// Returns the number in the file, and closes the file. Returns -1 for a null pointer, and -2 if the
+// file contains no number.
 long ReadAndClose(FILE* file) {
   unsigned value = 0;
   if (file == nullptr) return -1;
@@ -199,7 +200,7 @@ int main(int argc, char** argv) {
   const ssize_t length = read(fd, script.data(), script.size());
   if (length < 0) return 1;
   script.resize(static_cast<size_t>(length));
-  // This descriptor is opened before those of the commands, and exec closes it.
+  // The results are opened before any command runs. The commands therefore get later descriptors.
   std::ofstream out(argv[1] + std::string(".out"));
   out << "fd " << fd << std::endl;
   std::istringstream lines(script);

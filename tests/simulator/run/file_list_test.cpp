@@ -87,7 +87,7 @@ TEST(FileList, DirectoryWithoutPackagesIsTold) {
             Lines({"empty: no packages", "full/a.apk"}));
 }
 
-// A path has at most 4096 bytes, so the deepest directory cannot be read.
+// A path has at most 4095 bytes. The first directory with a longer path cannot be read.
 TEST(FileList, DirectoryThatCannotBeReadIsTold) {
   const TempDir directory;
   directory.Write("deep/a.apk", {});

@@ -334,7 +334,7 @@ TEST(Installation, IsMadeOfAPackageThatLiesAlone) {
             std::nullopt);
   EXPECT_FALSE(of_link.is_done());
   fs::remove_all(directory / "lib");
-  // A link to itself does not show whether there is such a directory.
+  // If lib is a link to itself, nobody can see whether lib/arm64 exists.
   fs::create_symlink("lib", directory / "lib");
   EXPECT_FALSE(is_laid_out(InstallWhen::kAlone));
 }

@@ -76,7 +76,7 @@ Report WholeReport() {
 }  // namespace
 
 // The event is compared as a whole, so that the test notices each member that is added, lost or
-// confused with another one.
+// confused with another member.
 TEST(VerdictEvent, HoldsTheWholeReport) {
   const Json event = ParseJournal(VerdictEvent(WholeReport())).at(0);
   EXPECT_EQ(event, Json::parse(R"json({

@@ -80,7 +80,7 @@ inline Json CannotSign(int error) {
   return Log(6, "VELT can't sign a file (result=10000, errno " + std::to_string(error) + ": x).\n");
 }
 
-// The facts of a package with these libraries. `error` is the errno of opening each one, or 0.
+// The facts of a package with these libraries. `error` is the errno of opening each library, or 0.
 inline PackageFacts WithLibraries(const Lines& entries, int error = 0, bool has_directory = false) {
   PackageFacts facts;
   for (const std::string& name : entries) {

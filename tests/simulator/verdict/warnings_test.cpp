@@ -60,7 +60,7 @@ using Lines = std::vector<std::string>;
 
 TEST(Warnings, GoodPackageHasNone) { EXPECT_EQ(Warnings(Good()), Lines()); }
 
-// ---- What others read is not what the tool reads.
+// ---- Other programs read other values than the tool.
 
 TEST(Warnings, CertificateThatShowsAnotherKeyThanTheKernelGets) {
   PackageFacts facts = Good();
@@ -143,8 +143,8 @@ TEST(Warnings, OtherKeyOfAnyNewerSigner) {
   EXPECT_EQ(Warnings(facts), Lines({"other-key: the v2 " + told, "other-key: the v3 " + told}));
 }
 
-// The same modulus with another exponent is another key. The key that the JAR signer's certificate
-// shows is also another key if its modulus is not the one that the kernel gets.
+// A newer signer's key must have the modulus that the kernel gets. It must also be the key in the
+// JAR signer's certificate. Otherwise it is another key.
 TEST(Warnings, OtherKeyWithAPartOfTheJarSigners) {
   PackageFacts facts = Good();
   facts.newer = {{"v2", CertificateWith("CN=other", kModulus, "other key")}};
