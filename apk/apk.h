@@ -39,9 +39,8 @@ class Apk {
   // Init then verifies its JAR signature and reads its manifests.
   //
   // `fd`: the file, open for reading. The caller keeps it open for the life of the object and
-  // closes it. If `fd` is -1, Init opens `path` itself. That descriptor stays open until Release()
-  // or the end of the process. If the file is no zip archive, Release() does not close that
-  // descriptor.
+  // closes it. If `fd` is -1, Init opens `path` itself. Release() closes that descriptor if the
+  // file is a zip archive. Otherwise it stays open until the process ends.
   // `path`: the file's name. If `path` is null, Init uses the descriptor's name in /proc.
   //
   // Verification fails without a message if "META-INF/MANIFEST.MF" is missing or cannot be

@@ -148,7 +148,7 @@ int ParseVersionAndSerial(Range* tbs, x509_certificate* cert) {
     if (!IsUniversal(hdr, kAsn1Integer) || hdr.length != 1 || hdr.payload[0] > 2) return -9;
     cert->version = hdr.payload[0];
     // Deliberate: the serialNumber is expected right after the version's number, not after the
-    // element that holds the number.
+    // element that contains the number.
     *tbs = After(from_inner, hdr.payload + hdr.length);
     if (!Next(tbs, &hdr)) return -5;
   }
@@ -412,7 +412,7 @@ bool KeepAltName(const asn1_hdr& hdr, x509_name* name) {
 }
 
 // Other programs may read a text only up to a NUL. A text with a NUL is therefore refused, and the
-// field is left empty.
+// field becomes empty.
 bool KeepText(const asn1_hdr& hdr, const uint8_t** text, uint64_t* length) {
   const bool good = !HoldsNul(hdr);
   *text = good ? hdr.payload : nullptr;

@@ -16,8 +16,8 @@ namespace ApkTools {
 namespace {
 
 // The starts of the lines that the tool's code logs for a refusal, and the reason that each line
-// gives. A refusal logs at most one of these lines, possibly twice. Only "Can't load manifest: "
-// may follow another line, "Parse manifest: ". The last line therefore gives the reason.
+// gives. A refusal logs at most one of these lines, possibly twice, with one exception: "Can't load
+// manifest: " may follow "Parse manifest: ". The last line therefore gives the reason.
 constexpr struct LoggedReason {
   const char* start;
   Reason reason;

@@ -4,7 +4,7 @@
 // The tool's own code decides, and reports the reason only in the Android log. This library
 // therefore reads each line that the code logs, and passes the line on to the log unchanged. To
 // read the lines, it defines __android_log_print for the whole program. Link this library into
-// programs only. In a shared library, the call may reach the platform's function instead, and the
+// programs only. In a shared library, calls of this function may reach the platform's instead. The
 // reasons for refusals are then wrong or kUnknown.
 #pragma once
 

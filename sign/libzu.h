@@ -4,7 +4,7 @@
 #include <cstddef>
 
 // Registers `length` bytes at `data` under `name` (NUL-terminated) for the open file `fd`. The
-// arguments stay the caller's. IsZuSuccess interprets the result.
+// caller still owns the arguments. IsZuSuccess interprets the result.
 extern "C" int ZuNewCertificate(int fd, const char* name, const unsigned char* data, size_t length);
 
 // Two results mean success. Every other result is a failure.

@@ -12,8 +12,9 @@
 #include "apk/apk.h"
 
 // Signs the file behind `fd`: a good package, or a plain JAR that the kernel already trusts.
-// `zip_fd` appears only in messages. Returns kVeltFailure if the file is not a zip archive, if the
-// package did not verify, if the kernel does not trust the JAR, or if VeltSignFd fails.
+// `zip_fd` appears only in messages. Returns 0 if the kernel signed the file. Returns kVeltFailure
+// if the file is not a zip archive, if the package did not verify, if the kernel does not trust the
+// JAR, or if VeltSignFd fails.
 uint32_t VeltSign(ApkTools::Apk& apk, int zip_fd, int fd);
 
 // Signs the native libraries that were extracted beside the package `apk`. `fd` appears only in a

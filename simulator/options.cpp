@@ -357,7 +357,8 @@ std::string WhyNoName(const std::string& name) {
   return name.empty() ? "the name is empty" : std::string();
 }
 
-// Reads LEVEL, LEVEL-LEVEL or LEVEL-. The last form has no upper end.
+// Reads LEVEL, LEVEL-LEVEL or LEVEL-. The last form has no upper end. Returns false if the text is
+// not valid.
 bool ReadLevels(const std::string& text, LevelRange* levels) {
   constexpr size_t kMostDigits = 5;
   const std::vector<std::string> parts = Split(text, '-');

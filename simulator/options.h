@@ -20,7 +20,7 @@ struct Options {
   JudgeOptions judge;
   GateOptions gate;
   ShowOptions show;
-  bool verify = false;    // ask the kernel which files it trusts, and nothing else
+  bool verify = false;    // only ask the kernel which files it trusts
   FileListOptions files;  // the files for the tool: at least one name or a list
 };
 

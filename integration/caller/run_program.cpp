@@ -20,7 +20,7 @@ constexpr int kCannotBecome = 127;
 // its child must not wait for a lock, and therefore must not allocate memory.
 struct Child {
   std::vector<char*> arguments;  // ends with a null pointer
-  int null;                      // /dev/null, behind the standard streams
+  int null;                      // /dev/null, at a number above the standard streams
   int descriptors;               // all descriptors are below this number
   rlim_t memory_bytes;
 };

@@ -193,7 +193,8 @@ static asmlinkage long integrity_fcntl(struct pt_regs *call)
 
 /* ---- /proc/PID/integrity/value */
 
-/* Returns the first text of the list, and removes it if there is another. The caller frees it. */
+/* Returns a copy of the list's first text, which the caller must free, or NULL. Removes the first
+ * text from the list if other texts follow. */
 static char *take_text(void)
 {
 	char *text, *comma;

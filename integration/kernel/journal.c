@@ -71,7 +71,8 @@ void journal_integrity(struct file *value, const char *text)
 	const char *quote = text ? "\"" : "";
 	int pid = 0;
 
-	/* As in the simulator's journal, 0 is the reading task itself: /proc/self or its own number. */
+	/* 0 is the reading task itself. /proc/self is a link to the task's number, so the module
+	 * cannot tell the two apart. The simulator's journal has 0 only for /proc/self. */
 	if (kstrtoint(task, 10, &pid) || pid == task_tgid_vnr(current))
 		pid = 0;
 	write_line("{\"event\":\"integrity\",\"pid\":%d,\"text\":%s%s%s}\n", pid, quote,

@@ -15,7 +15,7 @@ import java.util.LinkedHashSet;
 import java.util.Set;
 
 /**
- * Names each signer of a package, as the package manager knows it, by the same digest that
+ * Names each signer that the package manager knows for a package, by the same digest that
  * apktoolkit passes to the kernel. Use this class in the process that installs packages.
  *
  * <p>The package manager uses the newest signing block that it knows. apktoolkit uses the JAR

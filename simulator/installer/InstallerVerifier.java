@@ -337,7 +337,8 @@ public final class InstallerVerifier {
             }
         }
 
-        // Ignores levels that no phone has. Such a level means that the range has no end.
+        // Ignores levels that no phone has. Such a level means that the range has no beginning or
+        // no end.
         private static void addLevel(long level, SortedSet<Integer> starts) {
             if (level > 0 && level < NO_PHONES_LEVEL) {
                 starts.add((int) level);

@@ -1,6 +1,6 @@
 // The judgement of the platform's own verifier: whether a phone's installer installs the package.
-// The answers come from another program that has read a hostile file. A malformed answer counts as
-// no answer.
+// The answers come from another program, which may have read a hostile file. A malformed answer
+// counts as no answer.
 #pragma once
 
 #include <climits>

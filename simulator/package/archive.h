@@ -39,7 +39,8 @@ inline constexpr EntryNames kSignatureFileNames = {"META-INF/", ".SF"};
 // The entries of one kind, in the order in which the tool meets them.
 struct ArchiveWalk {
   std::vector<std::string> names;  // without those of damaged entries
-  // The number of them that the tool's walk reaches. The walk ends at the first damaged entry.
+  // The number of these names that the tool's walk reaches. The walk ends at the first damaged
+  // entry.
   size_t met = 0;
 };
 

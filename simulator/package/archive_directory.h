@@ -33,7 +33,8 @@ std::optional<ArchiveEnd> FindArchiveEnd(int fd);
 // directory does not show damaged data, so `is_damaged` is false in all results.
 std::vector<ArchiveEntry> ReadDirectory(int fd, const ArchiveEnd& end);
 
-// Reads `size` bytes of the file from `offset` on. Returns fewer if the file does not have so many.
+// Reads `size` bytes of the file from `offset` on. Returns fewer if the file ends earlier or cannot
+// be read.
 std::string ReadAt(int fd, uint64_t offset, size_t size);
 
 }  // namespace simulator

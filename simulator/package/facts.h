@@ -70,7 +70,8 @@ struct PackageFacts {
 };
 
 // Looks at the file at `path`, and at the libraries beside it. Reads no pipes and no devices, and
-// never waits. Compares no more entries with the manifest after `is_late` returns true.
+// never waits. After `is_late` returns true, reads no more bytes for `sha256`, and compares no more
+// entries with the manifest.
 PackageFacts LookAt(const std::string& path, const IsLate& is_late = IsNeverLate);
 
 // The SHA-256 digest of the bytes of an open file, in lower-case hexadecimal; empty if they cannot

@@ -13,8 +13,9 @@ namespace {
 thread_local volatile sig_atomic_t is_guarded = 0;
 thread_local volatile sig_atomic_t has_shrunk = 0;
 
-// Maps a page of zeros in place of the missing page, so that the read continues. After any other
-// SIGBUS, the default action is restored, and the process ends when this function returns.
+// Maps a page of zeros in place of the missing page, so that the read continues. If it cannot, or
+// after any other SIGBUS, restores the default action. The process then ends when this function
+// returns.
 void FillPage(int signal, siginfo_t* info, void*) {
   const uintptr_t page_size = static_cast<uintptr_t>(sysconf(_SC_PAGESIZE));
   void* const page =

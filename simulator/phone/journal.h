@@ -41,9 +41,9 @@ class Event {
   std::string line_;
 };
 
-// Opens the journal at `path` for appending, close-on-exec. Its descriptor is a high one, so that
-// the process's own files get the same descriptors as without it. Returns -1 if it cannot be
-// opened.
+// Opens the journal at `path` for appending, close-on-exec. Its descriptor has a high number, so
+// that the process's own files get the same descriptors as without the journal. Returns -1 if it
+// cannot be opened.
 int OpenJournal(const char* path);
 
 }  // namespace simulator

@@ -25,9 +25,9 @@ std::string HexText(std::string_view bytes);
 // start with one.
 size_t Utf8Length(std::string_view bytes);
 
-// True if the valid UTF-8 character must not be shown: it controls a terminal, has no width, or
-// changes the direction of the text around it, or is a noncharacter (U+FFFE, U+FFFF, which XML
-// forbids).
+// True if the valid UTF-8 character must not be shown, for example because it controls a terminal,
+// has no width or changes the direction of the text around it. Also true for U+FFFE and U+FFFF,
+// which XML forbids.
 bool IsHidden(std::string_view character);
 
 // The parts of `text` between the separators; one empty part if `text` is empty.

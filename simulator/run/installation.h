@@ -53,9 +53,9 @@ class Installation {
   std::string WithStablePaths(const std::string& journal) const;
   // The library entries of Arm ABIs that were not chosen.
   const std::set<std::string>& of_other_processors() const { return of_other_processors_; }
-  // The library entries whose names no installer accepts, and those with accepted names that cannot
-  // be extracted.
+  // The library entries whose names no installer accepts.
   const std::vector<std::string>& left_out() const { return left_out_; }
+  // The chosen library entries that cannot be extracted.
   const std::vector<std::string>& not_extracted() const { return not_extracted_; }
 
  private:

@@ -14,7 +14,8 @@ enum class LogMeaning {
   // kUnknown: none of the texts. kDetail: a detail of an error that another record also reports.
   kUnknown,
   kDetail,
-  // The steps of a run. "Taken up": the tool starts to sign the package, or one of its libraries.
+  // The steps of a run. "Taken up": the tool starts to sign a package, one of its libraries, or a
+  // JAR.
   kLibrariesBegin,
   kFileBegins,
   kFileEnds,

@@ -21,8 +21,8 @@ bool IsInterrupted();
 void EndIfInterrupted();
 
 // For posix_spawn: the new process gets a process group of its own. A signal from the keyboard goes
-// to a whole group, but must reach only this process, which then ends the others. If the signal
-// reached them, their end would look like a failure.
+// to a whole group, but must reach only this process, which then ends the new process. If the
+// signal reached the new process, its end would look like a failure.
 class OwnProcessGroup {
  public:
   OwnProcessGroup();

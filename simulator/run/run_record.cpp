@@ -133,8 +133,8 @@ void Reader::ReadError(const LogLine& line) {
       record_.has_no_key_path = true;
       return;
     case LogMeaning::kRegistrationFailed:
-      // The event of the registration normally has the failure. If no such event came last, the log
-      // line is kept.
+      // Normally the event of the registration has the failure. If there is no event, or if the
+      // last one reports success, the log line is kept.
       if (record_.registrations.empty() ||
           IsZuSuccess(static_cast<int>(record_.registrations.back().result))) {
         record_.other_errors.push_back(line.whole);
@@ -165,8 +165,8 @@ void Reader::ReadVerify(const json& event) {
 }
 
 // True if the kernel is asked about the file itself. While the tool signs libraries or the file,
-// the step decides. At other times the tool asks the kernel nothing. Another program (--tool) may
-// still ask. Then the path decides, and an empty path counts as the file itself.
+// the step decides. At other times the tool makes no request to the kernel, but another program
+// (--tool) may. The path then decides, and an empty path counts as the file itself.
 bool Reader::IsOwn(const std::string& path) const {
   if (step_ == Step::kLibraries || step_ == Step::kFile) return step_ == Step::kFile;
   return path.empty() || path == record_.PathForTool();
@@ -186,8 +186,8 @@ void Reader::AddLibrary(const std::string& path, Attempt::Outcome outcome) {
   record_.libraries.push_back(attempt);
 }
 
-// Adds the present attempt to the record. An attempt without a result is dropped: the package was
-// refused, or the JAR is not trusted.
+// Adds the present attempt to the record. An attempt without a result is dropped, for example if
+// the package was refused or the JAR is not trusted.
 void Reader::CloseAttempt() {
   const std::optional<Attempt> attempt = std::exchange(attempt_, std::nullopt);
   if (!attempt || attempt->outcome == Attempt::Outcome::kBegun) return;

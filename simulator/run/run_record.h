@@ -26,7 +26,7 @@ struct Attempt {
 
   std::string path;  // from the log or the kernel; may be empty
   Outcome outcome = Outcome::kBegun;
-  int64_t error = 0;                      // the kernel's errno, or that of opening
+  int64_t error = 0;                      // the errno of the kernel's refusal or of opening
   std::string payload;                    // the bytes that the kernel got, in hexadecimal
   std::optional<std::string> integrity;   // the tool's own value, as read last; none: no file
   LogMeaning why = LogMeaning::kUnknown;  // of the first error logged before, if any

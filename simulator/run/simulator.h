@@ -41,7 +41,7 @@ class Simulator {
  public:
   Simulator(const RunOptions& options, bool has_standard_input);
 
-  // Opens the state directory and looks for the stand-ins and the tool. Returns none if the
+  // Opens the state directory and looks for the kernel stand-in and the tool. Returns none if the
   // simulation can begin, else the reason why it cannot.
   std::optional<std::string> Prepare();
 

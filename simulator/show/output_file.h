@@ -25,8 +25,8 @@ class OutputFile {
   bool IsWanted() const { return !path_.empty(); }
   const char* option() const { return kind_.option; }
 
-  // Returns a reason not to write the file: it has other contents, is one of `inputs`, or is the
-  // file that standard output or standard error goes to. Else none.
+  // Returns a reason not to write the file: it exists and is not of this kind, is one of `inputs`,
+  // or is the file that standard output or standard error goes to. Returns nothing otherwise.
   std::optional<std::string> Objection(const std::vector<std::string>& inputs) const;
   // True if this file and `other` are the same file, even under two names. False for devices and
   // pipes.

@@ -17,7 +17,8 @@ inline constexpr size_t kMostPageLines = 200;
 // At most this many bytes of a text from a file are shown, with "…" for the rest. Bytes are counted
 // before the text is escaped.
 inline constexpr size_t kMostPageText = 400;
-// The limit in the table of files. The file's own part of the page shows more.
+// The limit for the package name and the signer's name in the table of files. The file's own part
+// of the page shows more.
 inline constexpr size_t kMostCellText = 120;
 
 // Replaces characters that could mislead the reader. The special characters of HTML are escaped

@@ -33,7 +33,7 @@ class Presenter {
   Presenter(const ShowOptions& options, size_t file_count);
 
   // Returns a reason not to begin if an output would overwrite a file of the user, or one of
-  // `inputs`, or if two outputs have the same path. Else none.
+  // `inputs`, or if two outputs are the same file. Else none.
   std::optional<std::string> Objection(const std::vector<std::string>& inputs) const;
   // Opens the outputs. Returns none, or why one of them cannot be written: then call GiveUp.
   std::optional<std::string> Begin();
@@ -75,7 +75,7 @@ class Presenter {
   bool is_interrupted_ = false;  // while a file was looked at
   size_t shown_ = 0;             // the number of files whose result was shown
   bool is_progress_shown_ = false;
-  std::string missing_;  // why the verifier could not be asked; empty: no such problem
+  std::string missing_;  // the message that no phone's installer was asked; empty: none
   int status_ = kAllSigned;
 };
 

@@ -67,8 +67,8 @@ std::string SignerJson(const std::string& scheme, const CertificateFacts& signer
   return Object(members);
 }
 
-// The JAR signature is shown with the key that the tool reads, even if other readers find another
-// key in the certificate.
+// The JAR signature is shown with the modulus digest of the report's key, even if other readers
+// find another key in the certificate.
 std::string SignersJson(const Report& report) {
   std::vector<std::string> signers;
   if (report.signer || report.key) {

@@ -33,14 +33,14 @@ const char* MoodCode(Mood mood);
 // number.
 std::string Summary(const std::vector<Verdict>& verdicts, std::optional<size_t> unseen = {});
 
-// The package's name, its signer and key, and the signer for whom phones install it, if that is
-// another one. `ellipsis` replaces the middle of a digest.
+// The package's name, its JAR signer and key, and the text of OtherOwnerText. `ellipsis` replaces
+// the middle of a digest.
 std::vector<std::string> OwnerFacts(const Report& report, const char* ellipsis);
 
 // The JAR signer and the key, such as "CN=Vault, RSA-2048, key 98302ce8…f64646".
 std::string SignerText(const Report& report, const char* ellipsis);
 
-// The signer for whom phones install the package, if it is not the JAR signer; else empty.
+// Names the signer for whom phones install the package. Empty unless the verdict is kOtherSigner.
 std::string OtherOwnerText(const Report& report);
 
 // The warnings that are alarms.
@@ -70,7 +70,7 @@ const char* SymbolOf(Mark mark, bool has_utf8);
 
 std::string NameOf(const Item& item);
 
-// The item's result and its reason; `verdict` is its report's.
+// The item's result and its reason. `verdict` is the report's verdict.
 std::string OutcomeOf(const Item& item, Verdict verdict);
 
 // The path at which the tool found the file.
@@ -78,12 +78,12 @@ inline const std::string& PathForTool(const Report& report) {
   return report.installed.empty() ? report.path : report.installed;
 }
 
-// For a report with `installed`.
+// The note in a report whose `installed` is not empty.
 inline constexpr char kLaidOutText[] =
     "its libraries were laid out beside it, as an installer does; --install=no turns this off";
 
 // True if the cure is shown below the item. It is not shown if nothing is wrong, or for a
-// consequence of another cause. Of neighbours with the same cause, only the last one shows it.
+// consequence of another cause. Only the last of several neighbours with the same cause shows it.
 // `next` is the next item, or null.
 bool HasCure(const Item& item, const Item* next);
 

@@ -131,8 +131,8 @@ Item OwnItem(const RunRecord& run, const PackageFacts& facts, const JudgeOptions
   return item;
 }
 
-// The kind that the tool saw. A file that it could not open is neither a package nor a JAR. Only a
-// JAR is signed with an empty payload.
+// The kind that the tool saw. A file that it could not open as an archive is neither a package nor
+// a JAR. Only a JAR is signed with an empty payload.
 ItemKind KindOf(const RunRecord& run) {
   constexpr char kNoData[] = "0000";
   if (run.is_jar || (run.own && run.own->payload == kNoData)) return ItemKind::kJar;
@@ -182,7 +182,7 @@ void AddKeyItems(const RunRecord& run, const JudgeOptions& options, std::vector<
 }
 
 // Adds all other failures. A message from the opening of the file usually explains why a package
-// was refused, or which part of a package a JAR does not have. If the tool tried to sign the file
+// was refused, or which part of a package a JAR does not have. If the tool tried to sign a package
 // nevertheless, the message is a separate failure.
 void AddToolItems(const RunRecord& run, const JudgeOptions& options, std::vector<Item>* items) {
   const auto add = [&](const Reason& reason) {

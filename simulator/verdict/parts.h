@@ -42,13 +42,13 @@ void AddInstallerItem(const Judgement& judgement, const JudgeOptions& options,
 bool IsJarSigner(const PublicKey& key, const Report& report);
 
 // Facts that matter to the user although they change nothing for the kernel. Reads only the items,
-// the signer and the key of the report. Leaves out a fact that the file's own item already has.
-// `now` is JudgeOptions::now.
+// the signer and the key of the report. Leaves out an exponent or a changed entry that an item
+// already reports. `now` is JudgeOptions::now.
 std::vector<Reason> FindWarnings(const RunRecord& run, const PackageFacts& facts,
                                  const Report& report, int64_t now = 0);
 
-// The parts of a package that its signature protects, in bytes. `items` are the report's, the
-// package's own first.
+// Counts the entries of the package, and their bytes: those that its signature protects, and those
+// that it does not protect. `items` are the items of the report.
 Protection FindProtection(const PackageFacts& facts, const std::vector<Item>& items);
 
 // The chain from the key to the entries. It breaks at the first item, the package or a library,

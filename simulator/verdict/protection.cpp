@@ -63,7 +63,7 @@ std::vector<Link> MakeChain(const PackageFacts& facts, const Report& report) {
       {"manifest", LinkState::kHolds, has_manifest ? "META-INF/MANIFEST.MF" : ""},
       {"entries", LinkState::kHolds,
        std::to_string(report.protection.verified.entries) + " compared with the manifest"}};
-  // The package itself is the first item.
+  // The package is the first item, so its fault is found before those of the libraries.
   const auto is_broken = [](const Item& item) {
     return item.reason.cause != nullptr && item.reason.cause->link != ChainLink::kNone &&
            (item.kind == ItemKind::kPackage || item.kind == ItemKind::kLibrary);

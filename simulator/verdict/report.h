@@ -126,10 +126,11 @@ struct Report {
   Events events;  // all events, in order
 };
 
-// The refused item that decides the verdict, mostly the first one; null if nothing was refused.
+// The refused item that decides the verdict: the installer's if the installer caused the verdict,
+// else the first. Null if nothing was refused.
 const Item* DecisiveItem(const Report& report);
 
-// The newest phones that install the package may install it for another signer than the JAR's.
+// The newest phones that install the package may install it for a signer other than the JAR signer.
 // Returns such a signer, or null if there is none. Reads only the signer and the key of the report.
 const CertificateFacts* OtherSigner(const Judgement& judgement, const Report& report);
 

@@ -14,7 +14,7 @@ inline std::string Counted(uint64_t count, const char* one, const char* many) {
   return std::to_string(count) + " " + (count == 1 ? one : many);
 }
 
-// One text: "v1, v2".
+// The words as one text: "v1, v2".
 inline std::string Joined(const std::vector<std::string>& words) {
   std::string text;
   for (const std::string& word : words) text += (text.empty() ? "" : ", ") + word;
