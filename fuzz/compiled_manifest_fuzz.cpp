@@ -32,7 +32,7 @@ bool Is(const char16_t* text, size_t length, const std::string& wanted) {
 }
 
 // Calls `use` with the text of the first attribute `name` that has a text. Returns its result, or
-// false if there is no such attribute.
+// false if the element has no such attribute.
 template <typename Use>
 bool WithAttribute(const ResXMLParser& parser, const char* name, Use use) {
   for (size_t i = 0; i < parser.getAttributeCount(); ++i) {

@@ -18,7 +18,7 @@ namespace {
 
 using Context = std::unique_ptr<BN_CTX, void (*)(BN_CTX*)>;
 
-// The private exponent for a public exponent of the fuzz key; null if there is no such exponent.
+// The private exponent for a public exponent of the fuzz key; null if no such exponent exists.
 Bignum PrivateExponent(uint32_t exponent) {
   const RSA* const key = TestRsaKey(kFuzzKey);
   const Context context(BN_CTX_new(), BN_CTX_free);

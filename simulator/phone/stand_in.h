@@ -17,7 +17,7 @@ namespace simulator {
 // The phone of this process. The first call reads it from the environment.
 const PhoneSettings& ThisPhone();
 
-// Appends `event` to the journal. Does nothing if there is no journal.
+// Appends `event` to the journal. Does nothing without a journal.
 void Record(const Event& event);
 
 // Restores errno at the end of its scope.

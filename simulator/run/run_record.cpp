@@ -133,7 +133,7 @@ void Reader::ReadError(const LogLine& line) {
       record_.has_no_key_path = true;
       return;
     case LogMeaning::kRegistrationFailed:
-      // Normally the event of the registration has the failure. If there is no event, or if the
+      // Normally the event of the registration has the failure. If this event is missing, or if the
       // last one reports success, the log line is kept.
       if (record_.registrations.empty() ||
           IsZuSuccess(static_cast<int>(record_.registrations.back().result))) {

@@ -29,7 +29,7 @@ class Junit {
   struct Case {
     std::string name;
     Outcome outcome;
-    std::string type;     // the code of the reason, or of the verdict if there is no reason
+    std::string type;     // the code of the reason, or of the verdict without a reason
     std::string message;  // the verdict and the reason in words
     std::string text;     // what was refused, or what is doubtful, and what to do
   };

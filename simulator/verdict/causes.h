@@ -462,7 +462,7 @@ inline constexpr Cause kWeakKey = {"weak-key", Group::kWarning, Severity::kWarni
     "another signer."};
 inline constexpr Cause kDebugKey = {"debug-key", Group::kWarning, Severity::kWarning,
     ChainLink::kNone, "", "it is signed with a debug certificate (CN=Android Debug); each "
-    "workstation makes another one", "Sign a release with a release key."};
+    "workstation makes its own", "Sign a release with a release key."};
 inline constexpr Cause kWeakDigest = {"weak-digest", Group::kWarning, Severity::kWarning,
     ChainLink::kNone, "", "SHA-1 or MD5 is in use: %s",
     "Sign it again with SHA-256: apksigner does so with --min-sdk-version 18. Certify the key of "

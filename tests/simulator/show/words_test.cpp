@@ -171,7 +171,7 @@ TEST(SignerRows, SayOfTheKeyWhatTheKernelGot) {
   report.key->was_got = false;
   EXPECT_EQ(SignerRows(report)[5].second, "98302ce8 (of the modulus alone, as the tool reads it)");
   // The certificate is also shown if the crypto library cannot read its key. The kernel's key is
-  // also shown if there is no certificate.
+  // also shown if the certificate is missing.
   report.signer->key = {"RSA", 0, "spki", ""};
   EXPECT_EQ(SignerRows(report).size(), 5U);
   EXPECT_EQ(SignerRows(report)[3].first, "public key SHA-256 digest");
