@@ -58,8 +58,7 @@ inline constexpr Cause kFileMissing = {"file-missing", Group::kNotLookedAt, Seve
     "Check the name; a relative one counts from the directory in which the tool is run."};
 inline constexpr Cause kFileNoPermission = {"file-no-permission", Group::kNotLookedAt,
     Severity::kUnseen, ChainLink::kKey, "", "there is no permission to read it",
-    "Give the user who runs the tool the right to read the file and to enter its "
-    "directories."};
+    "Give the user who runs the tool the right to read the file and to enter its directories."};
 inline constexpr Cause kFileNotOpened = {"file-not-opened", Group::kNotLookedAt, Severity::kUnseen,
     ChainLink::kKey, "", "it cannot be opened (%s)", "Fix the reported error, and run again."};
 inline constexpr Cause kReadOnlyFileSystem = {"read-only-file-system", Group::kNotLookedAt,
@@ -324,8 +323,7 @@ inline constexpr Cause kLibraryDigest = {"library-digest", Group::kLibrary, Seve
     "Sign the package with SHA-256 digests, as apksigner does."};
 inline constexpr Cause kLibraryNoPermission = {"library-no-permission", Group::kLibrary,
     Severity::kRefused, ChainLink::kNone, "`Can't open file`", "there is no permission to read it",
-    "Give the user who runs the tool the right to read it and to enter its "
-    "directories."};
+    "Give the user who runs the tool the right to read it and to enter its directories."};
 inline constexpr Cause kLibraryNotOpened = {"library-not-opened", Group::kLibrary,
     Severity::kRefused, ChainLink::kNone, "`Can't open file`, `File %s is not opened`",
     "it cannot be opened (%s)", "Fix the reported error, and run again."};
@@ -339,9 +337,8 @@ inline constexpr Cause kLibraryInPackage = {"library-in-package", Group::kLibrar
     "Nothing to do: it is loaded from the package."};
 inline constexpr Cause kLibraryNotInstalled = {"library-not-installed", Group::kLibrary,
     Severity::kAbsent, ChainLink::kNone, "`Can't open file`",
-    "no libraries for its processor are beside the package", "If the phone has another "
-    "processor, there is nothing to do. To lay out the libraries of all processors, give "
-    "--install=all."};
+    "no libraries for its processor are beside the package", "If the phone has another processor, "
+    "there is nothing to do. To lay out the libraries of all processors, give --install=all."};
 inline constexpr Cause kLibraryNotLaidOut = {"library-not-laid-out", Group::kLibrary,
     Severity::kNothing, ChainLink::kNone, "`Can't open file`",
     "it is for another processor than the phone's (--install=all lays out the libraries of all "
@@ -419,7 +416,6 @@ inline constexpr Cause kSignerDiffers = {"signer-differs", Group::kGate, Severit
     ChainLink::kNone, "", "the files of a package must have one signer: %s",
     "Sign all files of the package with one key and certificate. Check its other builds in "
     "separate runs."};
-
 inline constexpr Cause kWarningsRefused = {"warnings-refused", Group::kGate, Severity::kRefused,
     ChainLink::kNone, "", "a warning counts as a refusal (--werror): %s",
     "See what to do about each warning."};
