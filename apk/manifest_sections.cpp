@@ -43,9 +43,10 @@ ManifestSection ManifestSections::operator[](size_t index) const {
 
 void ManifestSections::reset(const uint8_t* text, size_t size) {
   // The table is reserved at once, because a table that grows in steps wastes the memory of its
-  // former sizes. Reserved memory is in use only after the table has filled it. Few attributes take
-  // fewer than kShortAttribute bytes of text. kManyAttributes are enough for two attributes of each
-  // of the 65,535 entries that an archive without zip64 can have.
+  // former sizes. Reserving takes only addresses: the system provides the memory page by page when
+  // the table is written. Few attributes take fewer than kShortAttribute bytes of text.
+  // kManyAttributes are enough for two attributes of each of the 65,535 entries that an archive
+  // without zip64 can have.
   constexpr size_t kShortAttribute = 32;
   constexpr size_t kManyAttributes = 1 << 17;
   text_ = reinterpret_cast<const char*>(text);
@@ -55,10 +56,11 @@ void ManifestSections::reset(const uint8_t* text, size_t size) {
   patience_ = kLittleText;
 }
 
-// Sorting a section drops repeated names. The section is sorted again only after the text has
-// advanced by kLittleText plus, for each name, the name's length and kTwoAttributes. kTwoAttributes
-// is the length of the text of two short attributes. Repeated names therefore take no more memory
-// than different names, and long names are not compared again after every few bytes.
+// Sorting a section drops repeated names. After each sort, the next sort waits for kLittleText more
+// bytes of text. For each name that the section then has, it also waits for the name's length and
+// kTwoAttributes. kTwoAttributes is the length of the text of two short attributes. Because of the
+// sorts, repeated names cannot fill the table. Because of the wait, long names are not compared
+// again after every few bytes.
 void ManifestSections::add(const ManifestAttribute& attribute) {
   constexpr size_t kTwoAttributes = 10;
   attributes_.push_back(attribute);

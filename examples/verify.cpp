@@ -1,6 +1,7 @@
 // Prints whether a package's JAR signature is good, and who made it. This is an example of a
-// program that links the verification. It signs nothing. Phones may install the package for another
-// signer: README.md shows how to compare the two signers.
+// program that links the verification. It signs nothing. Phones from Android 7 on take the signer
+// from a newer signature (v2, v3) if the package has one. This program does not read that
+// signature. README.md in this directory shows how to compare the two signers.
 #include <fcntl.h>
 #include <unistd.h>
 

@@ -1,13 +1,14 @@
 // apktoolkit-bound DIGESTS COMMAND... FILE: runs `COMMAND... FILE` if the JAR signer of the package
-// FILE is one of the package manager's signers. Otherwise it ends with one of its own exit
-// statuses.
+// FILE is one of the signers that the package manager knows for this package. Otherwise it ends
+// with one of its own exit statuses.
 //
 // The package manager uses the newer signing block. apktoolkit uses the JAR signature. No other
-// program compares the two (docs/threat-model.md, "Before you ship it"). DIGESTS comes from
-// SignerDigests.java: the SHA-256 digest of the RSA modulus of each of the package manager's
-// signers, in lower-case hexadecimal, separated by commas. This program finds the JAR signer with
-// the tool's own code, so it finds the same signer as the tool. It is a separate program because
-// that code ends the process if memory runs out, and does not free all of its memory.
+// program on the phone compares the signers of the two (docs/threat-model.md, "Before you ship
+// it"). DIGESTS comes from SignerDigests.java: the SHA-256 digest of the RSA modulus of each of the
+// package manager's signers, in lower-case hexadecimal, separated by commas. This program finds the
+// JAR signer with the tool's own code, so it finds the same signer as the tool. It is a separate
+// program because that code ends the process if memory runs out, and does not free all of its
+// memory.
 #include <fcntl.h>
 #include <unistd.h>
 
@@ -31,7 +32,7 @@ constexpr int kOtherSigner = 3;
 constexpr int kNoJarSigner = 4;
 constexpr int kNotStarted = 5;
 
-// Returns the digest of the signer's key, which is also in the tool's payload. Returns an empty
+// Returns the digest of the signer's key. The tool's payload has the same digest. Returns an empty
 // text if the file cannot be opened, is not a package, or has no good JAR signature.
 std::string JarSigner(const char* file) {
   const ScopedFd fd(OpenForReading(file, O_CLOEXEC));

@@ -1,7 +1,7 @@
 // The settings of the simulated phone. apktoolkit-sim passes them to the stand-ins in environment
-// variables, one per setting, all with the prefix APKTOOLKIT_SIM_. A setting without a variable has
-// the value of a healthy phone. Both apktoolkit-sim and the stand-ins use this file, so that names
-// and formats are defined in one place.
+// variables, one per setting, all with the prefix APKTOOLKIT_SIM_. Without its variable, a setting
+// has the default below, which is that of a healthy phone. Both apktoolkit-sim and the stand-ins
+// use this file, so that names and formats are defined in one place.
 #pragma once
 
 #include <sys/types.h>
@@ -22,7 +22,7 @@ inline bool operator==(const FileId& a, const FileId& b) {
   return a.device == b.device && a.inode == b.inode;
 }
 
-// A value in `PhoneSettings::integrity`: the file does not exist at this opening.
+// As a value in `PhoneSettings::integrity`: the integrity file does not exist when it is opened.
 inline constexpr char kMissing[] = "missing";
 
 struct PhoneSettings {

@@ -127,9 +127,10 @@ std::vector<std::string> LibraryNames(const Archive& archive) {
   return names;
 }
 
-// True if neither a directory of the installer nor a path at which the tool looks for a library
-// exists. Like the tool, this function looks beside the open file, not beside a link to it. Returns
-// false for a file on a read-only file system, because the tool does not sign there.
+// True if nothing was installed beside the package: the installer's directories, such as lib/arm64,
+// do not exist, and nothing is at the paths where the tool looks for libraries. Like the tool, this
+// function looks beside the open file, not beside a link to it. Returns false for a file on a
+// read-only file system, because the tool does not sign there.
 bool LiesAlone(int package, const std::vector<std::string>& libraries) {
   const std::string file = GetFilenameByFd(package);
   struct statvfs system = {};
@@ -149,8 +150,9 @@ bool LiesAlone(int package, const std::vector<std::string>& libraries) {
   });
 }
 
-// An installer uses one ABI for each kind of processor. Of two ABIs for the same kind, it uses the
-// first one for which the package has libraries. The libraries of all other ABIs are not laid out.
+// `choice` decides whether the libraries for 64-bit Arm, for 32-bit Arm or for both are laid out.
+// For each of the two, an installer uses only one ABI: the first in kPhoneAbis for which the
+// package has libraries.
 Layout PlanLayout(const std::vector<std::string>& entries, InstalledAbi choice,
                   std::vector<std::string>* left_out, std::set<std::string>* of_other_processors) {
   Layout layout;
@@ -178,8 +180,8 @@ Layout PlanLayout(const std::vector<std::string>& entries, InstalledAbi choice,
   return layout;
 }
 
-// True for lib/ABI/FILE, if an installer accepts the name FILE. FILE is always a file in the
-// directory of its ABI, because it contains no "/" and ends with ".so".
+// True for lib/ABI/FILE, if an installer accepts the name FILE. FILE cannot lead out of the
+// directory of its ABI: it contains no "/", and it is not "." or ".." because it ends with ".so".
 bool IsNameForInstallers(const std::string& entry) {
   const size_t slash = entry.find('/', strlen(kLibraryNames.prefix));
   return slash != std::string::npos && entry.find('/', slash + 1) == std::string::npos &&

@@ -24,7 +24,7 @@ constexpr Verdict kWorstFirst[] = {
     Verdict::kTrustedJar,
 };
 static_assert(std::size(kWorstFirst) == static_cast<size_t>(Verdict::kNotSimulated) + 1,
-              "each verdict has its rank; kNotSimulated is the last one");
+              "each verdict has a rank; kNotSimulated is the last in the enumeration");
 
 size_t RankOf(Verdict verdict);
 std::string ReasonText(const Report& report);
@@ -33,8 +33,9 @@ object Choice(const std::string& code, const std::string& word, size_t count);
 
 }  // namespace
 
-// Parts that a file can make long are cut before they are joined. Otherwise a long name could cut
-// off the key that follows it.
+// Texts from a package can have any length, so each text is cut before it is joined with others. If
+// the joined text were cut instead, a signer's long name could remove the key that follows the
+// name.
 void PageTable::Add(const Report& report) {
   rows_.push_back({rows_.size() + 1, report.file, report.verdict, ReasonText(report),
                    report.warnings.size(), Short(report.package_name, kMostCellText),
@@ -100,7 +101,8 @@ std::string CommonDirectory(const std::vector<std::string>& files) {
   if (files.empty()) return {};
   std::string_view common = files[0];
   for (const std::string& file : files) {
-    // A part of each name is left, even if it ends with "/".
+    // At least one character of each path remains after the common directory is removed, even if
+    // the path ends with "/".
     const size_t most = std::min(common.size(), file.empty() ? 0 : file.size() - 1);
     size_t size = 0;
     while (size < most && common[size] == file[size]) ++size;
@@ -117,7 +119,8 @@ size_t RankOf(Verdict verdict) {
                              std::begin(kWorstFirst));
 }
 
-// The decisive reason, or the other signer for whom phones install the package; then the alarms.
+// The decisive reason. Without a reason, the signer for whom phones install the package if that is
+// not the JAR signer. Then the alarms.
 std::string ReasonText(const Report& report) {
   std::vector<std::string> facts = {DecisiveReason(report)};
   if (facts[0].empty()) facts[0] = OtherOwnerText(report);

@@ -421,7 +421,7 @@ TEST(X509Bounds, EveryTruncationOfTheTbsCertificateIsReadNoFurther) {
   for (size_t length = header; length <= tbs.size(); ++length) {
     certificate.tbs =
         der::Sequence({Bytes(tbs.begin() + header, tbs.begin() + static_cast<ptrdiff_t>(length))});
-    // The bytes end with the tbsCertificate.
+    // Nothing follows the tbsCertificate, so a read beyond it crashes.
     const ParsedCertificate parsed(der::Sequence({*certificate.tbs}));
     EXPECT_LT(parsed.result, 0) << length;
     EXPECT_TRUE(Inside(parsed.bytes, parsed.cert)) << length;

@@ -13,7 +13,8 @@ namespace {
 
 constexpr size_t kRoom = 1 << 20;
 
-// The block is in the kRoom bytes before this address.
+// The end of the readable memory. The block that operator new puts there is in the kRoom bytes
+// before this address.
 uint8_t* memory_end = nullptr;
 // The size of the block that operator new must put there next; 0: no block.
 size_t size_at_end = 0;

@@ -1,8 +1,8 @@
 // Writes the APK signing block of the schemes that followed JAR signing (APK Signature Scheme v2,
 // v3, v3.1), with one function for each layer. The block is between an archive's entries and its
 // central directory. It protects the entries of META-INF like all other entries. Numbers are
-// little-endian. Every list and element has its length before it: 64 bits for a pair of the block,
-// and 32 bits for all others.
+// little-endian. The size of the block and the length before each of its pairs have 64 bits. Inside
+// a pair's value, every list and element has a length of 32 bits before it.
 #pragma once
 
 #include <cstdint>
@@ -22,8 +22,8 @@ Bytes SignerBytes(const Bytes& certificate);
 Bytes Signers(const std::vector<Bytes>& signers);
 // The block of these pairs of scheme and value: size, pairs, size again, magic.
 Bytes SigningBlockBytes(const std::vector<std::pair<uint32_t, Bytes>>& pairs);
-// The archive with `block` before its central directory and `comment`, of at most 255 characters,
-// at its end. The archive must not have a comment.
+// The archive with two additions: `block` before its central directory, and `comment` (at most 255
+// characters) at its end. The archive must not have a comment.
 Bytes ArchiveWithBlock(const Bytes& archive, const Bytes& block, const std::string& comment = "");
 
 // The archive, signed with scheme v2 by the RSA test key `key`: the block covers all bytes of the

@@ -103,7 +103,7 @@ TEST(LogLine, TextThatWasCutIsKnownByItsStart) {
   EXPECT_EQ(ReadLogLine(std::string(1023, 'x')).meaning, LogMeaning::kUnknown);
 }
 
-TEST(LogLine, WholeTextHasNoLineEnd) {
+TEST(LogLine, WholeTextLosesItsLastLineEnd) {
   EXPECT_EQ(ReadLogLine("a\n\n").whole, "a\n");
   EXPECT_EQ(ReadLogLine("a").whole, "a");
   EXPECT_EQ(ReadLogLine("").whole, "");
