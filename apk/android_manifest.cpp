@@ -1,7 +1,7 @@
 // Reads two facts from the compiled Android manifest: the package's name, and whether the package
-// asks for secure storage. A hostile document makes the parser return the same long texts again and
-// again. Texts are therefore compared as UTF-16, by length first, and only the package's name is
-// converted.
+// asks for secure storage. A hostile document can make the parser return the same long text many
+// times, and each conversion to UTF-8 would read the whole text. Texts are therefore compared as
+// UTF-16, by length first, and only the package's name is converted.
 #include <androidfw/ResourceTypes.h>
 #include <utils/String8.h>
 
@@ -34,8 +34,9 @@ uint16_t FirstUnit(Text text);
 
 bool Apk::ParseAndroidManifest(std::vector<uint8_t> bytes) {
   // The platform's parser does not check that a whole header or attribute is there before it reads
-  // one. The buffer is therefore longer than the document by one attribute, the larger of the two.
-  // A document shorter than a header is passed as empty, which the parser refuses.
+  // one. The buffer is therefore longer than the document, by the size of an attribute, which is
+  // larger than a header. A document that is shorter than a header is passed with size 0, which the
+  // parser refuses.
   const size_t size = bytes.size(), room = size + sizeof(android::ResXMLTree_attribute);
   bytes.reserve(room);
   bytes.resize(room);
@@ -71,8 +72,10 @@ bool Apk::ParseAndroidManifest(std::vector<uint8_t> bytes) {
 
 namespace {
 
-// A text that has only unpaired surrogates converts to an empty text. `nameless` has the address of
-// each converted text, so that no text is converted twice.
+// Returns the element's attribute "package" in UTF-8. The result is empty if the element does not
+// have the attribute, or if its text has only unpaired surrogates. `nameless` has the address of
+// each text that was converted before. Such a text gave an empty name, so it is not converted
+// again.
 String8 ReadPackageName(const ResXMLParser& parser, std::set<const char16_t*>* nameless) {
   const Text name = getStrAttr(parser, "package");
   if (name.empty() || !nameless->insert(name.data()).second) return String8();

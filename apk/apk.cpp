@@ -32,8 +32,8 @@ void Apk::Init(int fd, const char* path) {
   is_good_apk_ = VerifyPackage(std::move(android_manifest));
 }
 
-// Verifies the signature, then the manifest's digest. Only then parses the manifest, and the
-// Android manifest, whose digest is not checked.
+// Verifies the signature, and then the digest of META-INF/MANIFEST.MF. Only then parses that file
+// and AndroidManifest.xml. The digest of AndroidManifest.xml is not checked.
 bool Apk::VerifyPackage(std::vector<uint8_t> android_manifest) {
   std::vector<uint8_t> manifest;
   if (ExtractEntry(kMANIFEST_MF, manifest) != 0) return false;

@@ -89,9 +89,9 @@ class Apk {
   // it, and verifies its signature block ("RSA" in place of "SF"). Fails without a message if the
   // package has no signature file, or if that file cannot be extracted.
   bool InitCertSf();
-  // True if the certificate in `block` is signed with its own key, and the signature in `block` by
-  // the same key covers the signature file with these digests. On success, `key` becomes the
-  // modulus of that key. On failure, `key` is unchanged.
+  // True if the certificate in `block` is signed with its own key, and `block` also has a signature
+  // by that key over the signature file. The three digests are those of the signature file. On
+  // success, `key` becomes the modulus of that key. On failure, `key` is unchanged.
   bool VerifyCertificate(std::vector<uint8_t>& block, std::vector<uint8_t>& sha1,
                          std::vector<uint8_t>& sha256, std::vector<uint8_t>& md5,
                          std::vector<uint8_t>& key);
@@ -145,8 +145,8 @@ class Apk {
   std::vector<uint8_t> manufacturer_key_;
   bool ss_permission_required_ = false;
   std::string package_name_;
-  // The content of the last digested entry or file. Its memory is reused for the next entry or
-  // file. For large libraries, freeing and allocating it again would cost 2 % of the time.
+  // The content of the entry or file that was digested last. Its memory is reused for the next
+  // entry or file. For large libraries, freeing and allocating it again would cost 2 % of the time.
   std::vector<uint8_t> content_;
 };
 

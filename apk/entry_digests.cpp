@@ -7,7 +7,8 @@ namespace ApkTools {
 
 namespace {
 
-// The name and the value of the digest attribute that counts.
+// The name and the value of the section's digest attribute; two empty texts if it has none. If it
+// has several, the last one in byte order counts.
 ManifestMf::Section::value_type DigestOf(const ManifestMf::Section& section) {
   return section.findLastEndingIn("-Digest");
 }

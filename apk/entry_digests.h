@@ -16,7 +16,8 @@ class EntryDigests {
  public:
   // Forgets everything and loads the manifest. Returns false if the text does not parse.
   bool Load(std::vector<uint8_t> text);
-  // Lists the digests of the loaded manifest's sections. Before this call no entry is found.
+  // Lists the digests of the loaded manifest's sections. Before this call, Find returns false for
+  // every name.
   void List();
   // Returns false, with both texts untouched, if no digest is listed for the entry of this name.
   bool Find(std::string_view name, std::string& digest_name, std::string& digest) const;
@@ -26,9 +27,10 @@ class EntryDigests {
   std::string_view NameOf(uint32_t section) const;
 
   ManifestMf manifest_mf_;
-  // The indexes of the listed sections, ordered by the bytes of the entry names, then by place in
-  // the text. If the text is not in this order, the indexes are ordered by the hashes of the names
-  // first. hashes_ then contains these hashes, and is empty otherwise.
+  // The indexes of the listed sections. If the text has its names in byte order, the indexes are in
+  // the order of the text, and hashes_ is empty. Otherwise the indexes are sorted by the hash of
+  // the name, then by the name, then by the place in the text. hashes_ then contains the hash for
+  // each element of sections_.
   std::vector<uint32_t> sections_;
   std::vector<size_t> hashes_;
 };

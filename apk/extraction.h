@@ -14,12 +14,13 @@ namespace ApkTools {
 inline constexpr int32_t kZipInconsistentInformation = -9;
 inline constexpr int32_t kZipAllocationFailed = -13;
 
-// If the length is at most this number of bytes, memory is allocated before the data is read.
+// Memory for an entry of at most this declared length, in bytes, is allocated before the data is
+// read. The data of a longer entry is first read once, to check its length.
 inline constexpr uint32_t kZipTrustedLength = 64 << 20;
 
 // True if the declared length is possible. A stored entry is as long as its data. A deflated entry
-// is at most 1032 times as long as its data, because two bits encode at most 258 bytes (RFC 1951
-// section 3.2.5).
+// is at most 1032 times as long as its data: two bits encode at most 258 bytes (RFC 1951 section
+// 3.2.5), so one byte of data encodes at most 4 * 258 bytes.
 bool IsPlausibleLength(const ZipEntry& entry);
 
 // Extracts the whole entry into `out`, which then has the entry's length. If the declared length is

@@ -116,7 +116,7 @@ class Parser {
   // byte after the colon. After CR LF, that byte is the LF. After a lone CR or LF, it is the first
   // byte of the next line, and then counts as the line break. A name on the next line loses its
   // first byte, and an empty line or a continuation line is not recognised. Signing tools write CR
-  // LF. For other files, the result must stay as it always was.
+  // LF. For other files, the result must not change.
   bool passColon() {
     const char next = byteAt(cursor_ + 1);
     if (next != ' ' && !IsLineBreak(next)) {
@@ -129,7 +129,8 @@ class Parser {
     return true;
   }
 
-  // Moves the line to the end of the value. The bytes that were between them are never read again.
+  // Moves the continuation line to the end of the value. This may overwrite the bytes between the
+  // value and the line, which are never read again.
   void continueValue() {
     const ManifestPiece line = readLine();
     ManifestPiece& value = pending_.value;

@@ -92,6 +92,7 @@ class ManifestSections {
   void endSection();
 
  private:
+  // After a sort, add() sorts again only after at least this many bytes of text.
   static constexpr size_t kLittleText = 1024;
 
   size_t openStart() const { return ends_.empty() ? 0 : ends_.back(); }
@@ -100,5 +101,5 @@ class ManifestSections {
   const char* text_ = nullptr;
   std::vector<ManifestAttribute> attributes_;
   std::vector<uint32_t> ends_;     // the index in attributes_ at which each section ends
-  size_t patience_ = kLittleText;  // the text offset from which the open section is sorted again
+  size_t patience_ = kLittleText;  // an attribute at or after this offset causes a sort
 };

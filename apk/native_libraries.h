@@ -9,7 +9,7 @@
 namespace ApkTools {
 
 struct LibraryDirectory {
-  std::string_view entry_prefix;  // of the names in the archive
+  std::string_view entry_prefix;  // the start of the names in the archive
   const char* installed;          // where the installer puts those libraries, beside the package
 };
 

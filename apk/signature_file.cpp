@@ -137,7 +137,8 @@ bool Apk::VerifyData(const std::string& digest_name, const std::vector<uint8_t>&
 
 namespace {
 
-// `start` must point into the block or to its end.
+// True if the `length` bytes at `start` are inside the block. `start` must point into the block or
+// to its end.
 bool FitsInBlock(const std::vector<uint8_t>& block, const uint8_t* start, size_t length) {
   const auto offset = static_cast<size_t>(start - block.data());
   return offset <= block.size() && length <= block.size() - offset;

@@ -31,8 +31,9 @@ auto ZipNameFor(Entry* entry)
 ZipString ZipNameFor(...);
 using ZipName = decltype(ZipNameFor(static_cast<ZipEntry*>(nullptr)));
 
-// The templates below are for `ZipString`, or for a test's type with the same fields. A name points
-// to text that it does not own.
+// In each pair of functions below, the first is for std::string_view. The template is for
+// `ZipString`, or for a test's type with the same fields. A name points to text that it does not
+// own.
 
 inline void SetZipName(std::string_view& name, const std::string& text) { name = text; }
 // Sets the fields one by one: the constructor from a C string would stop at a NUL and abort on a

@@ -3,7 +3,7 @@
 # find_package and for pkg-config. The directory include/apktoolkit has the layout of the sources,
 # so that each header finds the others under the names that it includes.
 if(APKTOOLKIT_ZIPSTRING)
-  return()  # built against a library of the tests
+  return()  # this build uses the zip library of tests/compat, which is not installed
 endif()
 include(CMakePackageConfigHelpers)
 

@@ -7,7 +7,7 @@
 #include <cstddef>
 #include <cstdint>
 
-// Classes (X.690 §8.1.2.2) and the universal tag numbers in use (X.680 §8.6).
+// The classes (X.690 §8.1.2.2) and the universal tag numbers (X.680 §8.6) that the tool needs.
 inline constexpr uint8_t kAsn1Universal = 0;
 inline constexpr uint8_t kAsn1Context = 2;
 inline constexpr uint8_t kAsn1Private = 3;
@@ -26,9 +26,9 @@ inline constexpr uint32_t kAsn1GeneralizedTime = 24;
 struct asn1_hdr {
   const uint8_t* payload;  // first byte of the contents; null after a failure
   uint8_t identifier;      // the first identifier octet, unchanged
-  uint8_t class_;          // its bits 8 and 7
-  uint8_t constructed;     // its bit 6
-  uint32_t tag;            // its low five bits, or the long form's number
+  uint8_t class_;          // bits 8 and 7 of `identifier`
+  uint8_t constructed;     // bit 6 of `identifier`
+  uint32_t tag;            // the low five bits of `identifier`, or the long form's number
   uint32_t length;         // of the contents, in bytes; 0 for the indefinite form
 };
 
@@ -37,7 +37,7 @@ inline constexpr size_t kAsn1MaxArcs = 20;
 // One object identifier.
 struct asn1_oid {
   uint32_t oid[kAsn1MaxArcs];  // the arcs, first arc first
-  uint64_t len;                // arcs in use
+  uint64_t len;                // the number of arcs
 };
 
 // Reads the header at the start of the `len` bytes at `buf` into `hdr`. The element must end within
@@ -49,9 +49,10 @@ struct asn1_oid {
 // null.
 int asn1_get_next(const uint8_t* buf, size_t len, asn1_hdr* hdr);
 
-// Like asn1_get_next, for callers that trust an outer length. The element must end within `bound`
-// bytes from `buf`. The header must end within both `bound` and `available` bytes. The contents may
-// end beyond the `available` bytes. The caller must not read beyond these bytes.
+// Like asn1_get_next, for callers that trust the length of an outer element, even if it reaches
+// beyond their buffer. The element must end within `bound` bytes from `buf`. The header must end
+// within both `bound` and `available` bytes. The contents may end beyond the `available` bytes. The
+// caller must not read beyond these bytes.
 int asn1_get_next_bounded(const uint8_t* buf, size_t available, size_t bound, asn1_hdr* hdr);
 
 // Decodes the `len` bytes at `buf`, the contents of an OBJECT IDENTIFIER (X.690 §8.19). Empty

@@ -223,9 +223,9 @@ WRAPS_ON_PURPOSE void mpi_montmul(mpi* A, const mpi* B, const mpi* N, unsigned i
   }
   for (int i = 0; i <= n; ++i) A->p[i] = d[i];
 
-  // Deliberate: n limbs are always subtracted, so that both cases take about the same time. A
-  // product below N is subtracted from T, whose limbs are not read again. T contains the product
-  // above its lowest n limbs, so T is not less than the product and absorbs the borrow.
+  // Deliberate: n limbs are always subtracted, so that both cases take about the same time. If the
+  // product is below N, it is subtracted from T, and the result is not used. T still contains the
+  // product in the limbs from index n, so T is not less than the product and absorbs the borrow.
   if (mpi_compare_abs(A, N) >= 0) {
     subtract_with_borrow(n, N->p, A->p);
   } else {
@@ -299,9 +299,10 @@ WRAPS_ON_PURPOSE void subtract_with_borrow(int count, const uint32_t* s, uint32_
   for (int i = count; borrow != 0; ++i) borrow = d[i]-- == 0;
 }
 
-// Adds s * b + c to d over `kCount` limbs; returns the carry. A vector has one limb in each lane,
-// so each of the four half products is computed for all lanes at once. Their sums do not wrap: the
-// greatest half product, (2^16 - 1)^2, plus two half limbs fits in 32 bits.
+// Adds s * b + c to d over `kCount` limbs; returns the carry. A vector has one limb in each lane. A
+// product of limbs is the sum of four products of half limbs. Each of the four is computed for all
+// lanes at once. The sums do not wrap: (2^16 - 1)^2, the greatest product of half limbs, plus two
+// half limbs fits in 32 bits.
 template <int kCount>
 WRAPS_ON_PURPOSE uint32_t multiply_add(const uint32_t* s, uint32_t* d, uint32_t b, uint32_t c) {
   constexpr int kLanes = std::min(kCount, 4);
@@ -376,8 +377,7 @@ uint32_t quotient_digit(const mpi* X, int i, const mpi* Y, int t) {
   }
 }
 
-// Returns the quotient of the two limbs by d, but at most UINT32_MAX. The highest bit of d must be
-// set.
+// Returns (high * 2^32 + low) / d, but at most UINT32_MAX. The highest bit of d must be set.
 uint32_t estimate_digit(uint32_t high, uint32_t low, uint32_t d) {
   if (high >= d) return UINT32_MAX;
   uint32_t rest = high;

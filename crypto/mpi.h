@@ -89,7 +89,7 @@ int mpi_sub_abs(mpi* X, const mpi* A, const mpi* B);
 // X = A * b, with the sign of A. X may be A.
 int mpi_mul_int(mpi* X, const mpi* A, unsigned int b);
 
-// Adds s * b to d, over `count` limbs of s. d must have `count` limbs, and above these all limbs
+// Adds s * b to d, over `count` limbs of s. d must have `count` limbs and, above them, every limb
 // that the carry reaches. `s` may be null if `count` is 0.
 void mpi_mul_hlp(int count, const unsigned int* s, unsigned int* d, unsigned int b);
 

@@ -138,8 +138,9 @@ bool ReadPublicKey(const Block& block, const x509_certificate& certificate, pkcs
 }
 
 // Deliberate: the fifth to the eighth byte of an exponent overwrite the modulus length, which
-// follows the exponent in the record. Later bytes are dropped. Exponents in use have at most three
-// bytes. An attacker can choose the modulus length in this way, so the caller must check it.
+// follows the exponent in the record. Later bytes are dropped. The exponents of ordinary keys have
+// at most three bytes. An attacker can choose the modulus length in this way, so the caller must
+// check it.
 void StoreExponent(const asn1_hdr& exponent, pkcs7* record) {
   constexpr size_t kStart = offsetof(pkcs7, exponent);
   constexpr size_t kEnd = offsetof(pkcs7, modulus_length) + sizeof(record->modulus_length);
@@ -167,9 +168,9 @@ bool ReadSigner(const Block& block, const asn1_hdr& certificates, pkcs7* record)
 
   // Deliberate: the next two elements are found by position, and their tags are not checked. If a
   // SignerInfo has authenticated attributes, its digestEncryptionAlgorithm is read as the
-  // encryptedDigest and does not verify. The real signature covers only the attributes, not the
-  // signature file itself. The bound for both elements is the distance from the start of the block
-  // to the end of the digestAlgorithm.
+  // encryptedDigest, and the package is then refused. This is intended, because the real signature
+  // covers only the attributes, not the signature file itself. The bound for both elements is the
+  // distance from the start of the block to the end of the digestAlgorithm.
   const size_t bound = block.Skip(algorithm);
   asn1_hdr encryption, digest;
   if (!block.Read(bound, bound, &encryption) ||

@@ -1,4 +1,4 @@
-// RSA PKCS#1 v1.5 signature verification (RFC 8017 §8.2.2) on the tool's own integers.
+// RSA PKCS#1 v1.5 signature verification (RFC 8017 §8.2.2) with the integers of crypto/mpi.h.
 //
 // A context owns the limbs of its two numbers; an rsa_local releases them. No pointer to the
 // caller's bytes is kept after a call. A refused DigestInfo is logged at error priority, except a
@@ -35,7 +35,7 @@ constexpr bool rsa_is_forgeable(uint32_t exponent_value) {
   return exponent_value == 1 || exponent_value == UINT32_MAX;
 }
 
-// Results; 0 is success. The last two are flags, combined with a code of crypto/mpi.h.
+// Results; 0 is success. kRsaKeyFlag and kRsaPublicFlag are combined with a code of crypto/mpi.h.
 inline constexpr int kRsaBadInput = 5;
 inline constexpr int kRsaInvalidPadding = 7;
 inline constexpr int kRsaVerifyFailed = 18;

@@ -323,7 +323,7 @@ bool ParseExtension(Range extension, x509_certificate* cert) {
   }
 }
 
-// Reads the critical flag and the value of an extension, at the start of `extension`.
+// Reads the critical flag and the value of an extension. `extension` starts after the extnID.
 bool ReadExtensionValue(Range extension, bool* critical, Range* value) {
   *critical = false;
   const Range from_flag = extension;

@@ -17,7 +17,8 @@ namespace {
 
 // The starts of the lines that the tool's code logs for a refusal, and the reason that each line
 // gives. A refusal logs at most one of these lines, possibly twice, with one exception: "Can't load
-// manifest: " may follow "Parse manifest: ". The last line therefore gives the reason.
+// manifest: " may follow "Parse manifest: ". The line that was logged last therefore gives the
+// reason.
 constexpr struct LoggedReason {
   const char* start;
   Reason reason;
@@ -37,7 +38,7 @@ constexpr struct LoggedReason {
     {"Integrity not confirmed: classes.dex\n", Reason::kDexRefused},
 };
 
-// The reason of the verification that runs in this thread, or null.
+// Where the verification in this thread stores its reason; null if no verification runs.
 thread_local Reason* heard = nullptr;
 
 Reason ReasonOf(Apk& apk, Reason logged);
@@ -101,9 +102,10 @@ const char* TextOf(Reason reason) {
 
 namespace {
 
-// The log does not distinguish all cases, so the archive's entries are checked. The same line is
-// logged if "AndroidManifest.xml" is missing and if it cannot be extracted. No line is logged if
-// the manifest or the signature file is missing or cannot be extracted.
+// Returns the reason of a refusal. `logged` is the reason that the log gave, or kUnknown. The log
+// does not distinguish all cases, so the archive's entries are checked. The same line is logged if
+// "AndroidManifest.xml" is missing and if it cannot be extracted. No line is logged if the manifest
+// or the signature file is missing or cannot be extracted.
 Reason ReasonOf(Apk& apk, Reason logged) {
   if (logged == Reason::kAndroidManifestUnreadable) {
     return HasEntry(apk, "AndroidManifest.xml", "") ? logged : Reason::kNoPackage;
@@ -135,6 +137,7 @@ __attribute__((format(printf, 3, 0))) int HearAndLog(int priority, const char* t
   return __android_log_write(priority, tag, text);
 }
 
+// If `text` gives a reason, stores it for the verification that runs in this thread.
 void Hear(std::string_view text) {
   if (heard == nullptr) return;
   for (const auto& [start, reason] : kLoggedReasons) {

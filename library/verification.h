@@ -1,5 +1,5 @@
-// The verification for programs that link it: verifies one package, gives the reason for a refusal,
-// and releases the archive.
+// A library with which other programs verify packages. It verifies one package, returns the reason
+// for a refusal, and releases the archive.
 //
 // The tool's own code decides, and reports the reason only in the Android log. This library
 // therefore reads each line that the code logs, and passes the line on to the log unchanged. To

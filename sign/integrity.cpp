@@ -17,7 +17,7 @@ constexpr size_t kPathSize = 256;
 
 bool MaySign(uint32_t integrity) {
   // Deliberate: a read that waits never returns the value "not settled". This check refuses that
-  // value nevertheless, so that a change to the reader cannot let it through.
+  // value nevertheless, so that a change to VeltTaskReadIntegrity cannot let it through.
   return integrity != 0 && integrity != kNotSettled;
 }
 

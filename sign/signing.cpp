@@ -60,8 +60,8 @@ uint32_t VeltSignJni(ApkTools::Apk& apk, int fd, const char* /*path*/) {
 
 namespace {
 
-// Signs `fd`, which is the file of `apk` or one of its libraries. The payload is that of a package
-// or of a plain JAR.
+// Signs `fd`, which is the file of `apk` or one of its libraries. `apk` decides between the payload
+// of a package and that of a plain JAR.
 uint32_t VeltSignOat(ApkTools::Apk& apk, int fd) {
   return apk.IsApk() ? SignAsPackage(apk, fd) : SignAsJar(apk, fd);
 }
@@ -113,8 +113,9 @@ std::vector<uint8_t> SignPayload(const std::vector<uint8_t>& data) {
   return payload;
 }
 
-// Returns false if the file could not be verified against the signed manifest; the caller then logs
-// the refusal. Logs every other failure, and returns true.
+// Signs the extracted library `target` if its bytes match the digest of the entry in the signed
+// manifest. Returns false if they could not be verified; the caller then logs the refusal.
+// Otherwise returns true. Logs every other failure itself.
 bool SignLibrary(ApkTools::Apk& apk, const std::string& entry_name, const std::string& target) {
   // The digested file stays open, so that no other file can get its inode number meanwhile. Its
   // descriptor has a high number, so that the file to sign gets the lowest free descriptor.

@@ -1,5 +1,5 @@
-// Chooses the files that the tool asks the kernel to sign, and their payload. The files are each
-// extracted native library whose bytes match the signed manifest, and the package or JAR itself.
+// Chooses the files that the tool asks the kernel to sign, and their payload. These files are the
+// package or JAR itself, and each extracted native library whose bytes match the signed manifest.
 // Results are the codes of sign/integrity.h. Both functions log each step and each refusal. They do
 // not close the descriptors.
 //

@@ -280,7 +280,7 @@ void AddOutput(CLI::App* app, Options* options) {
   app->add_option("--journal", options->show.journal, "Write the journal to FILE; - is like --json")
       ->type_name("FILE")
       ->check(WhyNoName);
-  // Standard output has the verdicts, which would make any of these documents malformed.
+  // Standard output has the verdicts, so a JUnit, SARIF or HTML document there would be malformed.
   const auto is_no_stream = [](const std::string& path) {
     return std::string(
         path == "-" ? "it cannot be written to standard output; for a file named -, write ./-"
@@ -333,10 +333,11 @@ void AddVerify(CLI::App* app, Options* options) {
                            "--verbose", "--html", "--junit", "--sarif"}) {
     verify->excludes(app->get_option(name));
   }
-  verify->option_text(" ");  // replaces the list of excluded options, too long for a line
+  verify->option_text(" ");  // replaces the list of excluded options, which is too long for a line
 }
 
-// A word that begins with "-" and does not name an option may be the name of a file.
+// Returns the exit status if the command line has an unknown option. The message also helps a user
+// whose file has a name that begins with "-".
 std::optional<int> NameUnknownOption(const CLI::App& app) {
   std::vector<std::string> unknown = app.remaining();
   unknown.erase(std::remove(unknown.begin(), unknown.end(), "--"), unknown.end());
@@ -352,7 +353,8 @@ int MissFile() {
   return kUsageError;
 }
 
-// The name is empty if a script uses a variable that is not set.
+// Returns why the name is not accepted; empty if it is. A script passes an empty name if it uses a
+// variable that is not set.
 std::string WhyNoName(const std::string& name) {
   return name.empty() ? "the name is empty" : std::string();
 }

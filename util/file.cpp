@@ -32,8 +32,9 @@ bool IsSameFile(const struct stat& before, const struct stat& after) {
 int OpenForReading(const char* path, int flags) {
   const int fd = open(path, O_RDONLY | O_NONBLOCK | flags);
   if (fd >= 0 || errno != EWOULDBLOCK) return fd;
-  // Another process holds a lease. The holder must not get the time to put a FIFO in the file's
-  // place. An O_PATH descriptor therefore pins the file first, and the file is opened through it.
+  // Another process holds a lease, and open must now wait for its end. Meanwhile the holder could
+  // put a FIFO in the file's place, and open would wait for a writer. An O_PATH descriptor
+  // therefore pins the file first, and the file is opened through it.
   const ScopedFd pinned(open(path, O_PATH | O_CLOEXEC));
   struct stat state = {};
   if (pinned.get() < 0 || fstat(pinned.get(), &state) != 0 || !S_ISREG(state.st_mode)) return -1;

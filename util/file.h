@@ -27,8 +27,8 @@ int OpenForReading(const char* path, int flags);
 //   - is not a regular file, has an unknown size, or does not fit in memory:
 //     "Can't read file: %s (streamoff=%zd)\n" with -1 for the size.
 // Returns true even if fewer bytes can be read than the file's size. The rest of `out` then keeps
-// its old bytes, and has zeros where it was shorter before. If `out` is empty and its memory is too
-// small, this memory is freed first. Growing then copies nothing and never needs two buffers.
+// its old bytes. Bytes that `out` did not have before are 0. If `out` is empty and its memory is
+// too small, this memory is freed first. Growing then copies nothing and never needs two buffers.
 bool ReadFile(const std::string& path, std::vector<uint8_t>& out, struct stat* state = nullptr,
               int fd = -1);
 

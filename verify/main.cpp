@@ -52,7 +52,8 @@ bool IsCommandLineRight(int argc, char* argv[]) {
   return argc > 1;
 }
 
-// Opens the file without waiting, even if it is a FIFO or is leased.
+// Prints the file's line. Returns true if the kernel trusts the file. The open does not wait, even
+// for a FIFO or a leased file.
 bool IsTrusted(const char* path) {
   PrintPath(path);
   const int fd = open(path, O_RDONLY | O_NONBLOCK | O_NOCTTY | O_CLOEXEC);
@@ -83,7 +84,7 @@ bool AskKernel(int fd) {
 
 // A path may contain any byte except NUL. Control characters and the backslash are printed as \xHH,
 // so that a path cannot end the line or control a terminal. The control characters are those of
-// ASCII, and U+0080 to U+009F, which are 0xC2 and one more byte in UTF-8.
+// ASCII, and U+0080 to U+009F, which UTF-8 encodes as 0xC2 and one more byte.
 void PrintPath(const char* path) {
   bool begins_control = false;
   for (; *path != '\0'; ++path) {

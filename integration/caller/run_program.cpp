@@ -16,8 +16,9 @@ namespace {
 // programs use lower numbers.
 constexpr int kCannotBecome = 127;
 
-// Everything that the child needs. It is made before the fork. If the process has several threads,
-// its child must not wait for a lock, and therefore must not allocate memory.
+// Everything that the child needs. It is made before the fork, because the child must not allocate
+// memory. Another thread may hold the allocator's lock at the fork, and nobody would release this
+// lock in the child.
 struct Child {
   std::vector<char*> arguments;  // ends with a null pointer
   int null;                      // /dev/null, at a number above the standard streams

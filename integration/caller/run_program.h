@@ -14,7 +14,7 @@
 
 struct RunLimits {
   // The program is killed after this time. A package of 100 MB takes a phone some seconds. The tool
-  // waits forever on a kernel whose integrity value never settles.
+  // waits forever if its integrity value (/proc/self/integrity/value) stays ffffffff.
   int milliseconds = 120000;
   // The limit of the memory that the program can write to (RLIMIT_DATA); 0: this process's limit.
   // The tool needs up to 16 bytes for each byte of the file and of its entries' contents, and up to

@@ -32,9 +32,10 @@ enum class SignOutcome {
 // Runs the programs apktoolkit-verify, apktoolkit-bound and apktoolkit in `directory`
 // ("/system/bin").
 //
-// The product decides how to react. It should treat an untrusted package like a package without a
-// payload. After kTimedOut and kOutOfMemory the libraries may be signed. The package itself is not,
-// because it is signed last. Do not try again at once: the same file takes the same time.
+// The product decides how to react. It should treat an untrusted package like a package for which
+// the kernel has no payload (the digest of the signer's key). After kTimedOut and kOutOfMemory the
+// libraries may be signed. The package itself is not, because it is signed last. Do not try again
+// at once: the same file takes the same time.
 SignOutcome SignPackage(const std::string& directory, const InstalledPackage& package,
                         const RunLimits& limits);
 

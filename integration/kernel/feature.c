@@ -11,7 +11,7 @@
  *
  * The kernel itself is not changed. Kprobes redirect these two commands, and the look-up of
  * "integrity" below /proc/PID, to the functions below; everything else works as before. The module
- * cannot be unloaded, because /proc keeps inodes whose operations are here.
+ * cannot be unloaded, because /proc keeps inodes whose operations are in the module.
  */
 #include <crypto/sha2.h>
 #include <linux/file.h>
@@ -64,8 +64,8 @@ struct signature {
 	u8 data[];
 } __packed;
 
-/* Returns a signature without its digest, which the caller must free, or an error pointer. Each
- * byte is read only once, because the task may change it. */
+/* Returns a signature whose digest is not set, or an error pointer. The caller must free the
+ * signature. Each byte of the payload is read only once, because the task may change it. */
 static struct signature *copy_payload(const u8 __user *payload)
 {
 	struct signature *signature;
@@ -193,8 +193,8 @@ static asmlinkage long integrity_fcntl(struct pt_regs *call)
 
 /* ---- /proc/PID/integrity/value */
 
-/* Returns a copy of the list's first text, which the caller must free, or NULL. Removes the first
- * text from the list if other texts follow. */
+/* Returns a copy of the first text in the list `integrity`, or NULL if memory runs out. The caller
+ * must free the copy. Removes the first text from the list if other texts follow. */
 static char *take_text(void)
 {
 	char *text, *comma;

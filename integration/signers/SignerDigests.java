@@ -19,8 +19,9 @@ import java.util.Set;
  * apktoolkit passes to the kernel. Use this class in the process that installs packages.
  *
  * <p>The package manager uses the newest signing block that it knows. apktoolkit uses the JAR
- * signature. Pass a package to apktoolkit only if its JAR signer is one of the package manager's
- * signers. To check this, run apktoolkit-bound, or call {@link #isAmong}.
+ * signature, whose signer can be a different one. Pass a package to apktoolkit only if its JAR
+ * signer is one of the package manager's signers. To check this, run apktoolkit-bound, or call
+ * {@link #isAmong}.
  */
 public final class SignerDigests {
     private SignerDigests() {}
@@ -28,15 +29,16 @@ public final class SignerDigests {
     /**
      * Returns the digests of the current signers of an installed package. Needs API level 28 or
      * later ({@code PackageManager.GET_SIGNING_CERTIFICATES}). If the key was rotated, earlier keys
-     * are left out on purpose. Somebody else may have a retired key, and a payload names only the
-     * key, not the package.
+     * are left out on purpose. Somebody else may have a retired key, and apktoolkit passes only a
+     * digest of the key to the kernel, not the name of the package.
      */
     public static String of(SigningInfo info) throws CertificateException {
         return of(info.getApkContentsSigners());
     }
 
     /**
-     * Does the same for API level 27 ({@code PackageInfo.signatures}, {@code PackageManager.GET_SIGNATURES}).
+     * Returns the digests of the signers in {@code PackageInfo.signatures}, for API level 27
+     * ({@code PackageManager.GET_SIGNATURES}).
      *
      * @return the SHA-256 digest of each signer's RSA modulus, in lower-case hexadecimal, separated
      *     by commas. Other kinds of key are left out, because apktoolkit does not accept their
@@ -56,7 +58,10 @@ public final class SignerDigests {
         return String.join(",", digests);
     }
 
-    /** Returns true if {@code digests}, a result of {@link #of}, contains {@code jarSigner}. */
+    /**
+     * Returns true if {@code digests}, a result of {@link #of}, contains {@code jarSigner}, the
+     * digest of the JAR signer's key.
+     */
     public static boolean isAmong(String digests, String jarSigner) {
         return !jarSigner.isEmpty() && Arrays.asList(digests.split(",")).contains(jarSigner);
     }

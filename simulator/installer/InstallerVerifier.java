@@ -1,4 +1,4 @@
-// Asks the platform's own verifier (apksig) about packages, as a phone's installer does.
+// Asks the platform's own verifier (apksig) whether a phone's installer accepts packages.
 //
 // Arguments: the first and the last API level of the phones. Standard input: the paths of packages,
 // one per line. The answer to each path is one line on standard output, a JSON object in ASCII. The
@@ -99,8 +99,9 @@ public final class InstallerVerifier {
             starts.addAll(NEW_RULES);
             ranges = verifyEach(source, first, last, starts, hasNewer);
         }
-        // The lineage must lead from the signers for earlier levels to the signers for later
-        // levels. The verifier checks this only if it verifies all levels together.
+        // The lineage (the record of key rotations) must lead from the signers for earlier levels
+        // to the signers for later levels. The verifier checks this only if it verifies all levels
+        // together.
         if (!isRefused && hasNewer) {
             Range whole = verify(source, first, last, hasNewer);
             if (!whole.isVerified) {
@@ -114,7 +115,8 @@ public final class InstallerVerifier {
         return list(told);
     }
 
-    // Verifies the levels from each start to the next one as one range.
+    // Divides the levels into ranges, which begin at `first` and at each of the `starts`. Verifies
+    // each range.
     private static List<Range> verifyEach(DataSource source, int first, int last,
             SortedSet<Integer> starts, boolean hasNewer) throws Exception {
         List<Range> ranges = new ArrayList<>();
@@ -168,10 +170,11 @@ public final class InstallerVerifier {
         }
     }
 
-    // Phones of API 30 and later require v2 if the app targets 30 or later. The verifier checks
-    // this only if the range includes the app's target level. A range that ends at 30 or later is
-    // therefore verified without an upper end. This changes no other answer. Packages with v3 or
-    // v3.1 are an exception, because their signers may be for some levels only.
+    // Returns the verifier's answer for these levels. Phones of API 30 and later require v2 if the
+    // app targets 30 or later. The verifier checks this only if the range includes the app's target
+    // level. A range that ends at 30 or later is therefore verified without an upper end. This
+    // changes no other answer. Packages with v3 or v3.1 are an exception, because their signers may
+    // be for some levels only.
     private static Range verify(DataSource source, int first, int last, boolean hasNewer)
             throws Exception {
         if (first >= KNOWS_V31 && !hasMethod(ApkVerifier.Result.class, "isVerifiedUsingV31Scheme")
@@ -291,8 +294,8 @@ public final class InstallerVerifier {
     }
 
     // The signers of v3 and v3.1 in the signing block. Each of them is for a range of levels.
-    // Nothing is verified here. Signers after a malformed part of the block are not found. The
-    // verifier reports the error.
+    // Nothing is verified here. Signers after a malformed part of the block are not found, and the
+    // verifier reports that part as an error.
     private static final class NewerSigners {
         private static final int V3 = 0xf05368c0;
         private static final int V31 = 0x1b93ad61;

@@ -78,7 +78,7 @@ bool Installer::Start() {
   const ScopedFd theirs(ends[1]);
   pipe_.emplace(ends[0]);
   std::string words[] = {"java",
-                         "-Xmx512m",  // the limit holds for every package
+                         "-Xmx512m",  // the same limit of the heap for every package
                          "-XX:+UseSerialGC",
                          "-XX:TieredStopAtLevel=1",  // most runs are short
                          "-XX:-UsePerfData",         // leaves no files in /tmp

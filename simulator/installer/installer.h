@@ -1,6 +1,7 @@
 // The installer of the phones: the platform's own verifier, apksig, in a Java program
-// (InstallerVerifier.java). One process of this program judges all packages of a run. It is started
-// for the first package. If it fails on a package, the next package starts a new process.
+// (InstallerVerifier.java). One process of this program judges all packages of a run: it answers
+// whether phones install them. It is started for the first package. If it fails on a package, the
+// next package starts a new process.
 #pragma once
 
 #include <sys/types.h>

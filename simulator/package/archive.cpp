@@ -21,7 +21,7 @@ void SilenceTheLog() {
   }();
 }
 
-// A name that is invalid in every archive also counts as missing.
+// Also true for an invalid name, because an archive cannot have an entry with this name.
 bool IsMissing(int32_t result) {
   return result == ApkTools::kZipEntryNotFound || result == ApkTools::kZipInvalidEntryName;
 }

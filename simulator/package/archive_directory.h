@@ -25,8 +25,8 @@ struct ArchiveEntry {
   bool is_encrypted = false;
 };
 
-// Finds the end record of the open file `fd`. If several byte sequences look like one, the last one
-// counts. None if the file has no end record.
+// Finds the end record of the open file `fd`. If several byte sequences look like an end record,
+// the last of them counts. None if the file has no end record.
 std::optional<ArchiveEnd> FindArchiveEnd(int fd);
 
 // Returns the entries in the order of the directory. Ends at the first malformed record. The

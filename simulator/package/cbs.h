@@ -1,4 +1,5 @@
-// Untrusted bytes as input for CBS, libcrypto's reader. It never reads beyond their end.
+// Untrusted bytes as input for CBS, libcrypto's reader. CBS never reads beyond the end of the
+// bytes.
 #pragma once
 
 #include <openssl/bytestring.h>

@@ -151,9 +151,9 @@ std::string NameText(const X509_NAME* name) {
   return text;
 }
 
-// The library could print the whole name, but its keywords differ from those of the JDK, which
-// people search for. Here the library prints only the value: in quotation marks if it has special
-// characters, and as hexadecimal digits if it is not a text.
+// The library could print the whole name, but its keywords differ from those of the JDK. People
+// search for the JDK's keywords. Here the library prints only the value: in quotation marks if it
+// has special characters, and as hexadecimal digits if it is not a text.
 std::string AttributeText(const X509_NAME_ENTRY* attribute) {
   constexpr unsigned long kFlags = ASN1_STRFLGS_ESC_2253 | ASN1_STRFLGS_ESC_QUOTE |
                                    ASN1_STRFLGS_UTF8_CONVERT | ASN1_STRFLGS_DUMP_UNKNOWN |
@@ -200,7 +200,7 @@ std::string IssuerAndSerial(const X509* certificate) {
   return Text(issuer, static_cast<int>(issuer_size)) + Text(serial, serial_size);
 }
 
-// Returns an empty text if `size` is negative, by which the library reports a failure.
+// The library reports a failure by a negative `size`. The result is then empty.
 std::string Text(const uint8_t* bytes, int size) {
   if (size <= 0) return {};
   return {reinterpret_cast<const char*>(bytes), static_cast<size_t>(size)};

@@ -26,15 +26,15 @@ struct CertificateFacts {
   std::string issuer;
   bool is_self_issued = false;  // issuer and subject are the same name
   std::string sha256;           // of the whole certificate
-  std::string sha1;             // of the whole certificate, for stores that name a signer by it
+  std::string sha1;             // of the whole certificate; some stores identify signers by it
   // The algorithm of the certificate's own signature, such as "SHA384withRSA".
   std::string signature_algorithm;
   bool has_known_digest = false;  // it is signed with RSA PKCS#1 v1.5 over MD5, SHA-1 or SHA-256
-  // The last second at which it is valid, counted since 1970 in UTC; none: it cannot be read.
+  // The end of the certificate's validity, in seconds since 1970 (UTC); none: it cannot be read.
   std::optional<int64_t> not_after;
   PublicKey key;
-  // The contents of the two SignerIdentifiers by which a signature can name the certificate: issuer
-  // and serial number, and the subject key identifier, which may be empty.
+  // A signature names its certificate by a SignerIdentifier. For this certificate, it has one of
+  // two contents: issuer and serial number, or the subject key identifier (which may be empty).
   std::string issuer_and_serial;
   std::string key_id;
 };

@@ -92,7 +92,8 @@ bool IsSignatureName(const std::string& name) {
          EndsWith(name, ".DSA");
 }
 
-// Returns the names in the order of the manifest, each once.
+// Returns the names that the manifest has but the archive does not have. They are in the order of
+// the manifest, each once.
 std::vector<std::string> FindMissing(std::vector<uint8_t> text, const EntryDigests& manifest,
                                      const std::vector<ListedEntry>& entries) {
   std::unordered_set<std::string> known;

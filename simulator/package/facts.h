@@ -27,7 +27,7 @@ enum class FileKind {
   kArchive,
 };
 
-// One signer of one scheme after JAR signing.
+// One signer of one signature scheme that is newer than JAR signing (v1).
 struct NewerSignerFacts {
   std::string scheme;  // "v2", "v3" or "v3.1"
   CertificateFacts certificate;
@@ -36,8 +36,8 @@ struct NewerSignerFacts {
 // A library lib/….so of the package, and the file at the place where the tool looks for it.
 struct LibraryFacts {
   std::string entry;  // its name in the package
-  // The installer's place for it, relative to the package's directory; empty: its name does not
-  // begin with the directory of an Arm ABI.
+  // The path to which an installer extracts it, relative to the package's directory; empty: `entry`
+  // does not begin with the directory of an Arm ABI.
   std::string place;
   bool is_met = true;          // true if the tool's walk over the libraries reaches it
   int error = 0;               // errno of opening the file as the tool does; 0: it can be opened

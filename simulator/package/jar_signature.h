@@ -18,7 +18,7 @@ namespace simulator {
 // An RSA key as the tool reads it from a signature block. Other readers of the certificate may find
 // another key.
 struct ToolKey {
-  std::string modulus_sha256;  // the key's digest in a payload, in hexadecimal
+  std::string modulus_sha256;  // as in the payload that the kernel gets; in hexadecimal
   uint32_t size = 0;           // of the modulus, in bytes, as the tool counts them
   int bits = 0;
   int32_t exponent = 0;
@@ -31,7 +31,7 @@ struct JarSignatureFacts {
   std::vector<std::string> signature_files;
   std::string claimed_schemes;        // X-Android-APK-Signed, such as "2, 3"; empty: not stated
   bool has_manifest_digest = false;   // the signature file has a digest of the manifest
-  bool has_sha1_of_manifest = false;  // that digest, as the tool uses it, is SHA-1
+  bool has_sha1_of_manifest = false;  // the manifest digest that the tool uses is SHA-1
   // The name of the block that the tool looks for (.RSA). If the package has only a block for
   // another kind of key (.EC or .DSA), the name of that block.
   std::string block_name;
@@ -40,7 +40,7 @@ struct JarSignatureFacts {
   std::optional<ToolKey> key;
 
   SignatureBlockFacts block;  // as a strict reader finds it; its certificate is not kept
-  // The first certificate; none if it cannot be parsed, or if the tool reads its key from another
+  // The first certificate; none if it cannot be parsed, or if the tool reads the key from another
   // certificate.
   std::optional<CertificateFacts> certificate;
   bool names_other_certificate = false;  // the first signer's identifier names another certificate

@@ -9,7 +9,7 @@
 
 namespace simulator {
 
-// The endings of packages, JARs, and archives in which packages are delivered.
+// The endings of the file names of packages, JARs, and archives in which packages are delivered.
 inline constexpr std::string_view kPackageEndings[] = {".apk",  ".jar",  ".apks",
                                                        ".xapk", ".apkm", ".aab"};
 

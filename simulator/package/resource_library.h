@@ -1,5 +1,5 @@
-// Calls to the platform's resource library. Two generations of it are in use. The later one returns
-// texts as views. Only this file sees the difference.
+// Calls to the platform's resource library. The library has two generations. The newer one returns
+// texts as views. Only this file depends on the difference.
 #pragma once
 
 #include <cstddef>
@@ -7,8 +7,8 @@
 namespace simulator {
 
 // The length, in bytes, of the UTF-8 string `index` of `pool`, an android::ResStringPool; 0 if it
-// cannot be read. The first overload is for the older generation, the only one with a parameter for
-// the length.
+// cannot be read. The first overload is for the older generation, whose string8At() has a parameter
+// for the length.
 template <typename Pool>
 auto StringLength(const Pool& pool, size_t index)
     -> decltype(pool.string8At(index, static_cast<size_t*>(nullptr)), size_t()) {

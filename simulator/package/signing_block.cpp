@@ -99,8 +99,8 @@ bool ReadCertificate(CBS signer, CBS* certificate) {
          TakePrefixed(&signed_data, &certificates) && TakePrefixed(&certificates, certificate);
 }
 
-// Takes a part that follows its length. The length field has 4 bytes, little-endian, and counts
-// bytes.
+// Takes a length field and the part after it from `bytes`. The field has 4 bytes, little-endian,
+// and states the part's length in bytes.
 bool TakePrefixed(CBS* bytes, CBS* part) {
   uint32_t size = 0;
   return CBS_get_u32le(bytes, &size) && CBS_get_bytes(bytes, part, size);

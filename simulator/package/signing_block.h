@@ -20,7 +20,8 @@ struct NewerSigner {
 };
 
 struct SigningBlock {
-  // In the order of the block. If a scheme has several values, the first one counts.
+  // In the order of the block. If the block has several pairs for one scheme, the first pair
+  // counts.
   std::vector<NewerSigner> signers;
   // A part of the block is malformed. The signers are those before that part.
   bool is_damaged = false;

@@ -1,4 +1,5 @@
-// The kernel's integrity feature: its two commands, under both names of fcntl in the C library.
+// Simulates the two fcntl commands of the kernel's integrity feature, under both names that fcntl
+// has in the C library.
 //
 // This file, integrity_file.cpp, log.cpp and standard_output.cpp are one library, which is loaded
 // before all others. It replaces the functions by which the tool uses the phone's kernel and log.
@@ -110,13 +111,14 @@ int CopyPayload(const void* argument, std::string* payload) {
 }
 
 // Copies from the process's memory as the kernel does: if the memory cannot be read, returns false,
-// and no signal is sent. Copies through a file, because pwrite fails for unreadable memory. This
-// also works under an emulator.
+// and no signal is sent. Copies through a file, because pwrite reports unreadable memory as an
+// error, also under an emulator.
 bool CopyIn(const char* from, size_t size, char* to) {
   const ssize_t wanted = static_cast<ssize_t>(size);
   return pwrite(Scratch(), from, size, 0) == wanted && pread(Scratch(), to, size, 0) == wanted;
 }
 
+// Returns the descriptor of the file that CopyIn copies through.
 int Scratch() {
   static const int scratch = MoveHigh(memfd_create("payload", MFD_CLOEXEC));
   return scratch;

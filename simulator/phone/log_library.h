@@ -1,16 +1,16 @@
 // The records of the platform's log library.
 //
-// Two generations of the library are in use. Up to API level 29 a record is an
-// `__android_logger_data`, and the text is passed beside it. Later it is an `__android_log_message`
-// with the text inside. ReadLogRecord hides this difference. Texts and records belong to the
-// caller, and are read only during the call.
+// The library has two generations. Up to API level 29, a record is an `__android_logger_data`, and
+// the text is a separate argument. In later levels, a record is an `__android_log_message`, which
+// contains the text. ReadLogRecord hides this difference. Texts and records belong to the caller,
+// and are read only during the call.
 #pragma once
 
 #include <android/log.h>
 
 #include <type_traits>
 
-// Each generation of the library defines one of these.
+// Each generation of the library defines only one of these types.
 struct __android_logger_data;
 struct __android_log_message;
 

@@ -19,8 +19,8 @@ struct FileListOptions {
 struct ListedFile {
   enum class State {
     kToRun,            // the tool is run for it
-    kUnreadable,       // a walked directory or an entry in it that cannot be read: see `error`
-    kWithoutPackages,  // a walked directory with no package in it or below it
+    kUnreadable,       // a directory to search, or an entry in it, cannot be read: see `error`
+    kWithoutPackages,  // a searched directory with no package in it or below it
   };
 
   std::string name;
@@ -30,13 +30,13 @@ struct ListedFile {
 
 struct FileList {
   std::vector<ListedFile> files;
-  size_t others = 0;  // files below walked directories whose names are not those of packages
+  size_t others = 0;  // files below searched directories; their names are not package names
 };
 
 // Lists the files of the command line and then those of the list, in their order. With
 // `is_recursive` a directory is replaced by the files below it with package names (IsPackageName),
 // sorted by their paths, byte by byte. Symbolic links to directories are followed if they are
-// named, but not if the walk finds them. Empty names in a list are skipped.
+// named, but not if they are found below a directory. Empty names in a list are skipped.
 //
 // Returns none on success, else the reason of the failure: the list cannot be read, has no names,
 // or has NUL bytes although its names end with line feeds.

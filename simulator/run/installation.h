@@ -44,7 +44,8 @@ class Installation {
   std::optional<std::string> LayOut(const std::string& file, InstallWhen when, InstalledAbi abi,
                                     const Deadline& deadline);
 
-  // The path of the package for the tool: in the directory, or `file`.
+  // The path of the package for the tool: the copy in the temporary directory, or `file` if it was
+  // not laid out.
   const std::string& path() const { return path_; }
   // True if the package was laid out.
   bool is_done() const { return is_done_; }

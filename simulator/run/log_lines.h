@@ -8,8 +8,8 @@
 
 namespace simulator {
 
-// The meaning of a record of the tool's log. The comment above a group names the captured parts, if
-// there are any.
+// The meaning of a record of the tool's log. The comment above a group names the parts that
+// LogLine::text captures, if there are any.
 enum class LogMeaning {
   // kUnknown: none of the texts. kDetail: a detail of an error that another record also reports.
   kUnknown,
@@ -56,12 +56,13 @@ enum class LogMeaning {
 
 struct LogLine {
   LogMeaning meaning = LogMeaning::kUnknown;
-  std::string whole;  // without its line end
-  std::string text;   // the captured part
-  int64_t number = 0;
+  std::string whole;   // without its line end
+  std::string text;    // the captured part
+  int64_t number = 0;  // `text` as a number; 0 if `text` is not a number or was cut
 };
 
-// Reads a record's text. It may be cut, as the log cuts texts that are too long.
+// Returns the meaning and the captured part of a record's text. Also recognizes the start of a text
+// that the log cut because it was too long.
 LogLine ReadLogLine(const std::string& text);
 
 // The first line with this meaning; null if no line has it.

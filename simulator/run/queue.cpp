@@ -16,7 +16,7 @@ void RunInOrder(size_t count, unsigned jobs, const std::function<void(size_t num
                 const std::function<void(size_t number, int seconds)>& waiting) {
   using Clock = std::chrono::steady_clock;
   constexpr auto kNowAndThen = std::chrono::milliseconds(200);
-  std::mutex mutex;  // protects the three variables below
+  std::mutex mutex;  // protects `next` and `has_run`
   std::condition_variable finished;
   size_t next = 0;  // the first number that no thread has taken yet
   std::vector<bool> has_run(count);

@@ -133,8 +133,8 @@ void Reader::ReadError(const LogLine& line) {
       record_.has_no_key_path = true;
       return;
     case LogMeaning::kRegistrationFailed:
-      // Normally the event of the registration has the failure. If this event is missing, or if the
-      // last one reports success, the log line is kept.
+      // Normally the last "register" event reports this failure. The log line is kept only if there
+      // is no such event, or if it reports success.
       if (record_.registrations.empty() ||
           IsZuSuccess(static_cast<int>(record_.registrations.back().result))) {
         record_.other_errors.push_back(line.whole);

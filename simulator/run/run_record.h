@@ -1,5 +1,5 @@
 // A run of the tool: its events, sorted by the file to which each belongs. TakeApart fills a
-// RunRecord from the journal's events. Only its last members come from elsewhere.
+// RunRecord from the journal's events, except the last members, which Simulator::Run fills.
 #pragma once
 
 #include <cstdint>
@@ -28,8 +28,8 @@ struct Attempt {
   Outcome outcome = Outcome::kBegun;
   int64_t error = 0;                      // the errno of the kernel's refusal or of opening
   std::string payload;                    // the bytes that the kernel got, in hexadecimal
-  std::optional<std::string> integrity;   // the tool's own value, as read last; none: no file
-  LogMeaning why = LogMeaning::kUnknown;  // of the first error logged before, if any
+  std::optional<std::string> integrity;   // the tool's integrity value, as read last; none: no file
+  LogMeaning why = LogMeaning::kUnknown;  // the first error logged before the refusal, if any
 };
 
 // Why a run has no result for the file.
@@ -64,7 +64,7 @@ struct RunRecord {
 
   std::vector<LogLine> opening_errors;  // before the first step
   bool is_dex_refused = false;
-  LogMeaning dex_why = LogMeaning::kUnknown;  // of the first error logged before, if any
+  LogMeaning dex_why = LogMeaning::kUnknown;  // the first error logged before the refusal, if any
   std::vector<Attempt> libraries;             // in order
   std::optional<Attempt> own;                 // the file itself; none: no attempt with a result
   std::optional<int64_t> verify_error;        // a plain JAR: 0 if the kernel trusts it, else errno

@@ -43,8 +43,8 @@ std::string OwnDescriptorPath(int fd) {
   return "/proc/" + std::to_string(getpid()) + "/fd/" + std::to_string(fd);
 }
 
-// The result for a directory, or an unreadable entry in it, for which the tool is not run. It
-// contains only the reason.
+// The result for a directory without packages, or for a directory or an entry in it that cannot be
+// read. The tool is not run for these, and the result contains only the reason.
 FileRun RunOfDirectory(const ListedFile& directory) {
   FileRun run;
   const std::string path = Resolved(directory.name);

@@ -41,13 +41,13 @@ class Simulator {
  public:
   Simulator(const RunOptions& options, bool has_standard_input);
 
-  // Opens the state directory and looks for the kernel stand-in and the tool. Returns none if the
-  // simulation can begin, else the reason why it cannot.
+  // Opens the state directory and looks for the tool and the kernel stand-in, the library that
+  // answers in place of the kernel. Returns none if the simulation can begin, else the reason why
+  // it cannot.
   std::optional<std::string> Prepare();
 
-  // Runs the tool for `file`. Does not run the tool if `file` is a directory without packages, or a
-  // part of a directory that cannot be read. The result then has only the reason. Several threads
-  // may call this function if `jobs` is more than 1.
+  // Runs the tool for `file` if its state is kToRun. Otherwise the result has only the reason why
+  // the tool was not run. Several threads may call this function if `jobs` is more than 1.
   FileRun Run(const ListedFile& file);
 
  private:

@@ -1,4 +1,5 @@
-// Starts the tool with the stand-ins in place and waits for its end.
+// Starts the tool with the stand-ins, which answer in place of the phone's kernel, log and libzu.
+// Waits for the end of the tool.
 #pragma once
 
 #include <string>

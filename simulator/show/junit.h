@@ -1,6 +1,6 @@
 // The report of a run for programs that read test results: one JUnit document with a test case for
-// each file. A refusal is a failure, and a file that was not judged is an error. No case is ever
-// skipped. All texts from a file are escaped.
+// each file. A refused file is a failure. A file that the tool did not look at, or whose run could
+// not be simulated, is an error. No case is ever skipped. All texts from a file are escaped.
 #pragma once
 
 #include <string>
@@ -29,9 +29,9 @@ class Junit {
   struct Case {
     std::string name;
     Outcome outcome;
-    std::string type;     // the code of the reason, or of the verdict without a reason
+    std::string type;     // the reason's code; without a reason, the verdict's code
     std::string message;  // the verdict and the reason in words
-    std::string text;     // what was refused, or what is doubtful, and what to do
+    std::string text;     // what was refused, each warning, and what to do
   };
 
   size_t Count(Outcome outcome) const;

@@ -33,7 +33,7 @@ Item Short(Item item);
 // A section of the template without fields. It is shown if `condition` is true.
 kainjow::mustache::list OneIf(bool condition);
 
-// Such as "1,234,567".
+// The number in groups of three digits, such as "1,234,567".
 std::string Grouped(uint64_t number);
 
 // Sets the sections of a list: "NAME_shown" if there are lines, `name` with the fields that `make`

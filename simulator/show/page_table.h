@@ -35,8 +35,8 @@ class PageTable {
   std::vector<Row> rows_;
 };
 
-// The deepest directory that all these paths begin with, with its "/" at the end. Empty if that is
-// only "/", or if there is none.
+// The deepest directory that all these paths begin with, with its "/" at the end. Empty if this
+// directory is "/", or if the paths have no common directory.
 std::string CommonDirectory(const std::vector<std::string>& files);
 
 }  // namespace simulator

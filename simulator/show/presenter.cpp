@@ -197,7 +197,8 @@ int Complain(int status, const std::string& message) {
 
 int EndWith(int status) {
   std::cout.flush();
-  // If the reader has ended, this process later ends by SIGPIPE, as other programs do.
+  // If the program that reads the output has ended, IsInterrupted() is true because of SIGPIPE.
+  // This process later ends by that signal, as other programs do.
   if (std::cout || IsInterrupted()) return status;
   return Complain(std::max<int>(status, kCannotSimulate), "cannot write to standard output");
 }

@@ -18,7 +18,7 @@
 namespace simulator {
 
 struct ShowOptions {
-  Detail detail = Detail::kUsual;  // of the text
+  Detail detail = Detail::kUsual;  // how much of the report the text shows
   std::string journal;             // the path of the journal; empty: none
   std::string html;                // the path of the page; empty: none
   std::string junit;               // the path of the JUnit report; empty: none
@@ -72,10 +72,10 @@ class Presenter {
   OutputFile sarif_file_;
   Sarif sarif_;
   std::vector<Verdict> verdicts_;
-  bool is_interrupted_ = false;  // while a file was looked at
+  bool is_interrupted_ = false;  // the run was interrupted during the simulation of a file
   size_t shown_ = 0;             // the number of files whose result was shown
   bool is_progress_shown_ = false;
-  std::string missing_;  // the message that no phone's installer was asked; empty: none
+  std::string missing_;  // the message of MissingInstaller (words.h); empty: none
   int status_ = kAllSigned;
 };
 

@@ -9,7 +9,8 @@ namespace simulator {
 
 namespace {
 
-// Overlapping entries can together have more bytes than the file. The result is then 0.
+// Returns the bytes of the file that belong to no entry. Overlapping entries can together have more
+// bytes than the file. The result is then 0.
 Share Between(const Protection& protection, uint64_t file_size) {
   uint64_t rest = file_size;
   for (const Share* share : {&protection.verified, &protection.vouched, &protection.differing,
@@ -46,7 +47,7 @@ std::vector<DrawnPart> DrawBar(const Protection& protection, uint64_t file_size)
        protection.signature, 0, 0, 0},
       {"between", "between the entries", "headers, directory, padding, newer signing block", false,
        Between(protection, file_size), 0, 0, 0}};
-  // Faults that the package does not have are not shown.
+  // The parts that stand for a fault are drawn only if the package has this fault.
   parts.erase(
       std::remove_if(parts.begin(), parts.end(),
                      [](const DrawnPart& part) {

@@ -1,4 +1,4 @@
-// The picture of what the signature protects (Protection): one bar, and the meaning of its parts.
+// Draws what the signature protects (Protection) as one bar, and explains the parts of the bar.
 #pragma once
 
 #include <cstdint>
@@ -12,7 +12,7 @@ struct DrawnPart {
   const char* code;     // the ID of its pattern in the page
   const char* name;     // in the legend
   const char* meaning;  // an explanation
-  bool has_entries;     // else it is the bytes between the entries
+  bool has_entries;     // false for the bytes between the entries
   Share share;
   double percent;  // of all bytes
   double start;    // where it is drawn, in percent of the bar's width

@@ -27,7 +27,7 @@ nlohmann::ordered_json Message(const std::string& text) {
   return {{"text", Printable(text, {false, true})}};
 }
 
-// A byte that is not UTF-8 becomes U+FFFD.
+// Returns the JSON text of `value`. A byte that is not UTF-8 becomes U+FFFD.
 std::string TextOf(const nlohmann::ordered_json& value, int indent = -1) {
   return value.dump(indent, ' ', false, nlohmann::ordered_json::error_handler_t::replace);
 }

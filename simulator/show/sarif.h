@@ -1,8 +1,9 @@
 // The report of a run for programs that read results of static analysis: one SARIF log (OASIS
 // Static Analysis Results Interchange Format, version 2.1.0). Each refused item is a result of
 // level "error", unless it follows from another refusal. Each warning is a result of level
-// "warning". The rules are the causes. A file that was not judged is a notification of level
-// "error", and the run then counts as not successful. All texts from a file are escaped.
+// "warning". The rules are the causes (simulator/verdict/causes.h). A file that was not looked at,
+// or not simulated, is a notification of level "error", and the run then counts as not successful.
+// All texts from a file are escaped.
 #pragma once
 
 #include <map>
@@ -31,7 +32,7 @@ class Sarif {
   // Adds the next file, in the order of the command line.
   void Add(const Report& report);
 
-  // A failure of the run itself, such as another output that cannot be written.
+  // Adds a failure of the run itself, such as another output that cannot be written.
   void AddProblem(const std::string& problem);
 
   // The whole log, in UTF-8.
@@ -45,13 +46,13 @@ class Sarif {
                  const Json& location);
   size_t RuleOf(const Cause& cause, const char* level);
 
-  std::map<std::string, size_t> rule_of_;      // by the cause's code
-  std::map<std::string, size_t> artifact_of_;  // by its JSON
+  std::map<std::string, size_t> rule_of_;      // the index in rules_, by the cause's code
+  std::map<std::string, size_t> artifact_of_;  // the index in artifacts_, by the artifact's JSON
   Json rules_ = Json::array();
   Json artifacts_ = Json::array();
   Json results_ = Json::array();
   Json notifications_ = Json::array();
-  bool is_successful_ = true;          // each file was judged, and nothing else failed
+  bool is_successful_ = true;          // no notification has the level "error"
   bool is_installer_missing_ = false;  // reported once for the whole run
 };
 

@@ -90,7 +90,7 @@ Line DescribeAnswer(const json& event, const std::string& directory) {
   return {kind, path + ": " + answer, detail, is_failure};
 }
 
-// The payload starts with the length of what follows, the low byte first.
+// The payload starts with the length of its data, in two bytes, the low byte first.
 std::string ExplainPayload(const std::string& hex) {
   constexpr size_t kLengthDigits = 4;
   constexpr size_t kSha256Digits = 64;

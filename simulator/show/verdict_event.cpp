@@ -67,8 +67,8 @@ std::string SignerJson(const std::string& scheme, const CertificateFacts& signer
   return Object(members);
 }
 
-// The JAR signature is shown with the modulus digest of the report's key, even if other readers
-// find another key in the certificate.
+// If the report has a key, the modulus digest of the JAR signer ("v1") is the digest of this key.
+// Readers other than the tool may find another key in the certificate.
 std::string SignersJson(const Report& report) {
   std::vector<std::string> signers;
   if (report.signer || report.key) {

@@ -43,17 +43,19 @@ std::string SignerText(const Report& report, const char* ellipsis);
 // Names the signer for whom phones install the package. Empty unless the verdict is kOtherSigner.
 std::string OtherOwnerText(const Report& report);
 
-// The warnings that are alarms.
+// The texts of the warnings that have the severity kAlarm.
 std::vector<std::string> AlarmFacts(const Report& report);
 
 // The reason of the item that decides the verdict; empty if nothing was refused.
 std::string DecisiveReason(const Report& report);
 
-// The message that the phones' installer was not asked because its verifier is missing; else empty.
+// If the verifier of the phones' installer is missing, returns a message that reports this. Else
+// returns an empty text.
 std::string MissingInstaller(const Report& report);
 
-// The facts after the file's name in the verdict's line: the decisive reason or, if nothing was
-// refused, the owner; then an unexpected signer, the alarms, and the number of all warnings.
+// The facts after the file's name in the verdict's line, in this order: the decisive reason or, if
+// nothing was refused, OwnerFacts; the command line's refusal of the signer, unless it is the
+// decisive reason; the alarms; the number of all warnings.
 std::vector<std::string> HeadFacts(const Report& report, const char* ellipsis);
 
 // The mark before a line.
@@ -83,15 +85,15 @@ inline constexpr char kLaidOutText[] =
     "its libraries were laid out beside it, as an installer does; --install=no turns this off";
 
 // True if the cure is shown below the item. It is not shown if nothing is wrong, or for a
-// consequence of another cause. Only the last of several neighbours with the same cause shows it.
-// `next` is the next item, or null.
+// consequence of another cause. If consecutive items have the same cause, only the last of these
+// items shows the cure. `next` is the next item, or null.
 bool HasCure(const Item& item, const Item* next);
 
-// The text at the link, or "not reached" beyond a break.
+// The link's text, or "not reached" for each link after a broken one.
 std::string TextOf(const Link& link);
 
-// Label and value for each fact. The labels are those of apksigner, except for the modulus, so that
-// one search finds both outputs.
+// Label and value for each fact. Except for the modulus, the labels are those of apksigner. One
+// search then finds a fact in the outputs of both programs.
 using Rows = std::vector<std::pair<std::string, std::string>>;
 // The facts of a certificate, as readers other than the tool find them.
 Rows CertificateRows(const CertificateFacts& certificate);

@@ -17,7 +17,7 @@ enum class Group {
   kKey,
   kTool,
   kInstaller,  // a phone's installer does not install the package
-  kGate,       // the command line demands something else
+  kGate,       // the file does not meet a demand, such as --signer
   kWarning,    // a fact that the user should check, even if everything was signed
 };
 
@@ -401,7 +401,7 @@ inline constexpr Cause kInstallerGaveUp = {"installer-gave-up", Group::kInstalle
     "did not build this package, do not trust it. A large package may need a larger --timeout; "
     "--installer=off judges without the installer."};
 
-// ---- The gate: what the command line demands.
+// ---- The gate: demands on the file in addition to the phone's answer.
 inline constexpr Cause kSignerUnexpected = {"signer-unexpected", Group::kGate, Severity::kRefused,
     ChainLink::kNone, "", "its signer is not one that --signer names: %s",
     "Sign it with the key that --signer names; a rotated key has to be named as well. If you did "

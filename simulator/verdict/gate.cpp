@@ -179,7 +179,7 @@ Signers InstalledSigners(const Report& report) {
 
 bool IsJudged(const Report& report) { return report.installer.state == Judgement::State::kJudged; }
 
-// A signature with such a key does not prove who signed.
+// Anyone can sign with a forgeable key, so the signature does not prove who signed.
 bool HasForgeableKey(const Report& report) {
   return std::any_of(report.warnings.begin(), report.warnings.end(),
                      [](const Reason& warning) { return warning.cause == &cause::kForgeableKey; });

@@ -127,7 +127,7 @@ Reason WhyNotVerified(const Library& library, const RunRecord& run, const Packag
 }
 
 // The tool does not log why a file could not be opened. The simulator therefore opens the file as
-// well: `library.error` is the errno of its attempt.
+// well: `library.error` is the errno that the simulator got.
 Reason WhyNotThere(const LibraryFacts& library, const RunRecord& run, const PackageFacts& facts) {
   const int error = library.error;
   if (error == EACCES || error == EPERM) return {&cause::kLibraryNoPermission, ""};

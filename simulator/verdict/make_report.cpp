@@ -181,9 +181,9 @@ void AddKeyItems(const RunRecord& run, const JudgeOptions& options, std::vector<
   if (run.has_no_key_path) add("", {&cause::kRegistrationNoPath, ""});
 }
 
-// Adds all other failures. A message from the opening of the file usually explains why a package
-// was refused, or which part of a package a JAR does not have. If the tool tried to sign a package
-// nevertheless, the message is a separate failure.
+// Adds the failures that no other item reports. An error from the opening of the file usually
+// belongs to the file's own item. For a JAR, it shows only why the file is not a package. If the
+// tool tried to sign a package nevertheless, the error is a separate failure.
 void AddToolItems(const RunRecord& run, const JudgeOptions& options, std::vector<Item>* items) {
   const auto add = [&](const Reason& reason) {
     items->push_back(NotDone(ItemKind::kTool, "tool", reason, options));
@@ -228,10 +228,11 @@ Verdict JudgeWithInstaller(Verdict verdict, const Report& report) {
   return verdict == Verdict::kSigned && has_other ? Verdict::kOtherSigner : verdict;
 }
 
-// The key is the one that the kernel got with the package, or else with a library. If the kernel
-// got none, the key is the one that the tool's own code reads from the file.
+// Fills in the payload, the package's name, the signers and the key. The key is the key that the
+// kernel got with the package, or else with a library. If the kernel got no key, it is the key that
+// the tool's own code reads from the file.
 void DescribeSigners(const RunRecord& run, const PackageFacts& facts, Report* report) {
-  constexpr char kDigestFollows[] = "2000";  // 32, the low byte first
+  constexpr char kDigestFollows[] = "2000";  // the digest's length, 32, the low byte first
   const auto take = [report](const Attempt& attempt) {
     if (attempt.outcome != Attempt::Outcome::kSigned || !report->payload.empty()) return;
     report->payload = attempt.payload;

@@ -66,7 +66,8 @@ Reason WhyNotLookedAt(const RunRecord& run, const PackageFacts& facts) {
   return {};
 }
 
-// JARs of the platform have a classes.dex as well, but neither resources nor libraries.
+// A classes.dex does not count as a part of a package, because JARs of the platform have one as
+// well. They have neither resources nor libraries.
 Reason WhyTakenForAJar(const PackageFacts& facts) {
   std::string part;
   bool has_packages = false;

@@ -51,8 +51,9 @@ std::vector<Reason> FindWarnings(const RunRecord& run, const PackageFacts& facts
 // that it does not protect. `items` are the items of the report.
 Protection FindProtection(const PackageFacts& facts, const std::vector<Item>& items);
 
-// The chain from the key to the entries. It breaks at the first item, the package or a library,
-// whose cause breaks a link. All members of the report except the chain must be filled.
+// Makes the chain from the key to the entries. Looks for the first item, the package or a library,
+// whose cause breaks a link. The chain is broken at this link. All members of the report except the
+// chain must be filled.
 std::vector<Link> MakeChain(const PackageFacts& facts, const Report& report);
 
 }  // namespace simulator

@@ -126,8 +126,8 @@ struct Report {
   Events events;  // all events, in order
 };
 
-// The refused item that decides the verdict: the installer's if the installer caused the verdict,
-// else the first. Null if nothing was refused.
+// The refused item that decides the verdict: the installer's item if the installer caused the
+// verdict, else the first refused item. Null if nothing was refused.
 const Item* DecisiveItem(const Report& report);
 
 // The newest phones that install the package may install it for a signer other than the JAR signer.

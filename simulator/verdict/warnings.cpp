@@ -97,8 +97,8 @@ void WarnOfSigners(const PackageFacts& facts, const Report& report, Reasons* war
   }
 }
 
-// Collisions of SHA-1 and MD5 are known. Lists each use of them in the JAR signature and in the
-// certificates of all schemes.
+// Warns of each use of SHA-1 and MD5 in the JAR signature and in the certificates of all schemes.
+// Collisions of these digests are known.
 void WarnOfWeakDigests(const PackageFacts& facts, Reasons* warnings) {
   const auto is_weak = [](const std::string& name) {
     return name.compare(0, 4, "SHA1") == 0 || name.compare(0, 3, "MD5") == 0;
