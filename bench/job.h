@@ -1,6 +1,6 @@
-// The steps that the floor and the peer share: all of the tool's job except the verification. Each
-// step is done once, and only needed data is kept. Both programs read only the good packages that
-// bench_packages makes, and exit if anything unexpected happens.
+// The steps that bench_floor and bench_peer share. They are all of the tool's job except the
+// verification. Each step is done once, and only needed data is kept. Both programs read only the
+// good packages that bench_packages makes, and exit if anything unexpected happens.
 #pragma once
 
 #include <cstdint>
@@ -39,8 +39,8 @@ std::string SignatureFileName(const GivenPackage& package);
 std::string WalkManifest(const Buffer& compiled_manifest);
 
 // Does three things for each library beside the package: reads the whole file, calls `check` with
-// the entry's name and the file's bytes, and tries to sign the file, as the tool does on a
-// workstation.
+// the entry's name and the file's bytes, and tries to sign the file. On a workstation, this fails
+// as in the tool.
 using CheckLibrary = std::function<void(const std::string& name, const Buffer& content)>;
 void SignLibraries(const GivenPackage& package, const CheckLibrary& check);
 void SignGiven(const GivenPackage& package);

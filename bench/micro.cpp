@@ -57,7 +57,8 @@ void MontMul(benchmark::State& state) {
 }
 BENCHMARK(MontMul)->Name("mpi_montmul")->Arg(1024)->Arg(2048)->Arg(4096);
 
-// R^2 mod N: the only long division of a public operation.
+// Computes R^2 mod N, where R is 2^32 to the power of the number of limbs of N. A public operation
+// of RSA has no other long division.
 void ModMpi(benchmark::State& state) {
   Operands operands(KeyOf(state));
   mpi_local power, remainder;

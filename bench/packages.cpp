@@ -23,7 +23,7 @@ struct Plan {
   size_t libraries;
   size_t library_size;
   size_t dex_size;
-  size_t entry_size;  // of each other entry
+  size_t entry_size;  // of each entry that is neither classes.dex nor a library
   const char* key = "rsa-2048";
   bool in_order = true;  // true: sorted by name, as by apksigner; false: unsorted, as by jarsigner
 };

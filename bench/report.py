@@ -1,5 +1,6 @@
-"""bench/report.py BUILD-DIRECTORY: measures the tool, the floor and the peer, prints the tables, and
-writes the numbers and plots of docs/performance.md. scripts/bench calls it."""
+"""bench/report.py BUILD-DIRECTORY: measures the tool, the floor (bench_floor) and the peer
+(bench_peer), prints the tables, and writes the numbers and plots of docs/performance.md.
+scripts/bench calls it."""
 
 import collections
 import datetime
@@ -20,7 +21,7 @@ DOCUMENT = 'docs/performance.md'
 
 # rounds: how often each program runs. floor, peer: the greatest allowed ratio of the tool's time to
 # that program's time. memory: the greatest allowed ratio of the tool's memory to the floor's. None:
-# no target. margin: the fraction of the target by which each ratio may exceed it.
+# no target. margin: the fraction of the target by which each ratio may exceed the target.
 Package = collections.namedtuple('Package', 'name rounds floor peer memory margin')
 PACKAGES = [
     Package('small', 101, 1.07, 0.90, 1.03, 0.05),
@@ -84,8 +85,8 @@ def measure(package):
 
 
 def expect_same_log(package):
-    """Exits unless the three programs wrote the same log, and it has VeltSign's result. Without the
-    kernel's feature the result is 65536, a failure."""
+    """Exits unless the three programs wrote the same log, and this log has VeltSign's result 65536.
+    It is a failure, because the kernel of a workstation has no integrity feature."""
     logs = {re.sub(r'\d\d-\d\d \d\d:\d\d:\d\d +\d+ +\d+', '', subprocess.run(
         [program, package_path(package.name)], check=True, capture_output=True, text=True).stderr)
         for program in (TOOL, FLOOR, PEER)}
@@ -140,8 +141,8 @@ def growth(runs, start_up):
 
 
 def measure_outside(package):
-    """The wall-clock seconds of apksigner and jarsigner, which check every entry: the shorter of two
-    runs of each."""
+    """The wall-clock seconds of apksigner and jarsigner. Each runs twice, and the shorter run
+    counts. These programs check every entry."""
     commands = (['apksigner', 'verify', '--min-sdk-version', '18', '--max-sdk-version', '23'],
                 ['jarsigner', '-verify'])
     times = []
@@ -165,7 +166,7 @@ def outside_table(outside):
 # ---- Instructions.
 
 def callgrind(command, options=()):
-    """The instructions executed, and the profile."""
+    """The number of executed instructions, and the text of the profile."""
     profile = f'{BUILD}/callgrind.out'
     subprocess.run(['valgrind', '--quiet', '--tool=callgrind', f'--callgrind-out-file={profile}',
                     *options, *command], check=True, capture_output=True)
@@ -197,7 +198,7 @@ def instructions_per_limb(limbs=128):
 # ---- Parts.
 
 def measure_micro():
-    """The processor time of each benchmark by its name, in nanoseconds: the median of three runs."""
+    """Maps each benchmark's name to its processor time in nanoseconds (median of three runs)."""
     samples = collections.defaultdict(list)
     for _ in range(3):
         for program in MICRO:
@@ -251,8 +252,8 @@ def text_table():
         yield '| ' + ' | '.join(cells) + ' |'
 
 
-# Each part has a pattern. A sample counts for the first part whose pattern matches the sample's
-# file.
+# The parts of a run, each with a pattern. A sample of perf counts for the first part whose pattern
+# matches the file of the sampled code.
 PARTS = (('start-up', r'/ld-linux'), ('kernel', r'kernel'), ('inflate', r'/libz\.'),
          ('digests', r'/libcrypto\.'), ("the tool's own code", r'/apktoolkit$'), ('libraries', r''))
 

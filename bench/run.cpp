@@ -3,8 +3,8 @@
 //
 //   PROGRAM <TAB> wall microseconds <TAB> cpu microseconds <TAB> peak resident kilobytes
 //
-// The program is small and separate, because the peak memory of a child process starts at the peak
-// of its parent.
+// bench_run is a small, separate program, because the peak memory of a child process starts at the
+// peak of its parent.
 #include <fcntl.h>
 #include <spawn.h>
 #include <sys/resource.h>

@@ -42,7 +42,7 @@ void ReadOid(const uint8_t* data, size_t size, size_t room) {
 
   const uint8_t* next = nullptr;
   if (size == 0 || asn1_get_oid(data, size, &oid, &next) != 0) return;
-  Require(oid.len >= 2 && oid.len <= 20, "an element has 2 to 20 arcs");
+  Require(oid.len >= 2 && oid.len <= 20, "an object identifier element has 2 to 20 arcs");
   Require(LiesIn(next, 0, data, size), "the next element is in the range, or at its end");
   CheckText(oid, room);
 }

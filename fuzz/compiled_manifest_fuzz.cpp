@@ -1,7 +1,7 @@
-// apk/android_manifest.cpp: any bytes as the compiled Android manifest. The tool's buffer for
-// them ends right before memory that cannot be read, because the platform's parser is not
-// instrumented. A second reader converts texts to UTF-8 before it compares them. Both readers must
-// find the same facts.
+// apk/android_manifest.cpp: any bytes as the compiled Android manifest. The sanitizers do not check
+// the platform's parser. The tool's buffer for the bytes therefore ends right before memory that
+// cannot be read. A second reader converts texts to UTF-8 before it compares them. Both readers
+// must find the same facts.
 #include <androidfw/ResourceTypes.h>
 #include <utils/String8.h>
 
@@ -31,8 +31,8 @@ bool Is(const char16_t* text, size_t length, const std::string& wanted) {
   return std::string(converted.c_str(), converted.length()) == wanted;
 }
 
-// Calls `use` with the text of the first attribute `name` that has a text. Returns its result, or
-// false if the element has no such attribute.
+// Calls `use` with the text of the first attribute `name` that has a text. Returns the result of
+// `use`, or false if the element has no such attribute.
 template <typename Use>
 bool WithAttribute(const ResXMLParser& parser, const char* name, Use use) {
   for (size_t i = 0; i < parser.getAttributeCount(); ++i) {

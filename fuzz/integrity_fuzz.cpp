@@ -1,5 +1,5 @@
-// sign/integrity.h: any texts in the integrity file, one for each opening. The last text is a
-// settled value, so that every wait ends.
+// sign/integrity.h: any texts in the integrity file, a new one each time that the tool opens it.
+// The last text is a settled value (not ffffffff), so that every wait ends.
 #include "sign/integrity.h"
 
 #include <algorithm>

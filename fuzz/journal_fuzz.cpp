@@ -1,6 +1,6 @@
-// A package influences names and texts in a journal. This target reads them as the simulator does:
-// it escapes texts and reads them back, or reads one line of the tool's log, or a whole run. The
-// first byte selects the part.
+// A package influences names and texts in a journal. This target does one of three things with the
+// input, as the simulator does. It escapes a text and reads it back, reads one line of the tool's
+// log, or reads the journal of a whole run. The first byte selects which.
 #include <algorithm>
 #include <sstream>
 #include <string>

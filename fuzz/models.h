@@ -1,5 +1,6 @@
-// Second parsers for the texts that the tool parses. The fuzz targets compare their results with
-// the tool's. Their code differs from the tool's, so that the same fault is unlikely in both.
+// Second parsers for the texts that the tool parses. The fuzz targets compare the results of these
+// parsers with the tool's. These parsers work in another way, so that the same fault is unlikely in
+// both.
 #pragma once
 
 #include <cstdint>

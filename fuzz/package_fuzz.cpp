@@ -1,7 +1,7 @@
-// Runs the whole tool, from main() on, with any bytes as the package file, on a phone inside this
-// program. The first byte of the input selects the phone. A model (package_model.h) reads the same
-// bytes and judges every signature and registration. The peak memory has a limit, and no descriptor
-// may stay open.
+// Runs the whole tool, from main() on, with any bytes as the package file. The phone is simulated
+// inside this program (support/phone.h). The first byte of the input selects the phone. A model
+// (package_model.h) reads the same bytes, and must allow every signature and registration. The peak
+// memory has a limit, and no descriptor may stay open.
 #include <dirent.h>
 #include <fcntl.h>
 #include <sanitizer/allocator_interface.h>
@@ -118,7 +118,7 @@ std::string PathOf(int fd) {
   return std::filesystem::read_symlink("/proc/self/fd/" + std::to_string(fd)).string();
 }
 
-// Judges each request of the tool to the phone.
+// Checks with the model that the tool may send each of its requests to the phone.
 class Judge {
  public:
   Judge(const Bytes& archive, const Phone& phone) : archive_(archive), phone_(phone) {}

@@ -24,7 +24,7 @@ class PackageModel {
   bool is_good() const { return is_good_; }
   const Bytes& key() const { return key_; }
   // True if one of the archive's libraries is installed at `path`, for a package in `directory`
-  // (with its "/"), and is listed with the digest of `content`.
+  // (with its "/"), and the manifest lists it with the digest of `content`.
   bool AllowsLibrary(const std::string& directory, const std::string& path,
                      const Bytes& content) const;
 

@@ -25,7 +25,7 @@ int Judge(const Bytes& digest_info, Bytes prefix, const Bytes& digest) {
 }
 
 int JudgeMd(Bytes digest_info, const Bytes& md5) {
-  const uint8_t algorithm = digest_info[13];
+  const uint8_t algorithm = digest_info[13];  // 5: MD5; MD2 and MD4 differ only in this byte
   const Bytes prefix = {0x30, 0x20, 0x30, 0x0c, 0x06, 0x08, 0x2a, 0x86, 0x48,
                         0x86, 0xf7, 0x0d, 0x02, 0x00, 0x05, 0x00, 0x04, 0x10};
   digest_info[13] = 0;
@@ -33,7 +33,8 @@ int JudgeMd(Bytes digest_info, const Bytes& md5) {
   return algorithm == 5 ? Judge(digest_info, prefix, md5) : kBadPadding;
 }
 
-// RFC 8017 section 9.2, but without a minimum length of the padding.
+// Returns the expected result for an encoded message. The rules are those of RFC 8017 section 9.2,
+// but the padding has no minimum length.
 int JudgeMessage(const Case& c, const Bytes& message) {
   if (message[0] != 0 || message[1] != 1) return kBadPadding;
   const auto separator =
@@ -70,7 +71,8 @@ Bytes Take(FuzzedDataProvider& input, size_t size) {
 
 Case ReadCase(FuzzedDataProvider& input) {
   constexpr size_t kLengths[] = {15, 16, 34 + 3, 35 + 3, 51 + 3, 64, 65, 66, 128, 512, 513};
-  // With the exponent 1, the signature is the encoded message, so the input chooses its bytes.
+  // With the exponent 1, the signature is the encoded message, so the input chooses the message's
+  // bytes.
   constexpr uint32_t kExponents[] = {1, 3, 17, 65537, 0, 2, 0x80000000, 0xffffffff, 0x7fffffff};
   const auto length = input.ConsumeBool() ? input.PickValueInArray(kLengths)
                                           : input.ConsumeIntegralInRange<size_t>(0, 140);

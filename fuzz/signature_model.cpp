@@ -101,16 +101,18 @@ Bytes VerifiedKey(const pkcs7& record, const Bytes& block, const Bytes& signatur
 void CompareWithStrictReader(const pkcs7& record, const Bytes& block) {
   StrictBlock strict;
   if (!ReadStrictly(block, &strict)) return;
-  Require(Same(strict.tbs, record.tbs_data, record.tbs_data_length), "the signed part");
+  Require(Same(strict.tbs, record.tbs_data, record.tbs_data_length),
+          "both readers find the same signed part");
   Require(Same(strict.certificate_signature, record.cert_signature, record.cert_signature_length),
-          "the certificate's signature");
+          "both readers find the same signature of the certificate");
   Require(Same(strict.encrypted_digest, record.signed_digest, record.signed_digest_length),
-          "the signer's signature");
+          "both readers find the same signature of the signer");
   if (CBS_len(&strict.exponent) > sizeof(record.exponent)) return;
   Require(std::equal(CBS_data(&strict.exponent),
                      CBS_data(&strict.exponent) + CBS_len(&strict.exponent), record.exponent),
-          "the exponent");
+          "both readers find the same exponent");
   if (CBS_len(&strict.modulus) > 0 && CBS_data(&strict.modulus)[0] == 0)
     CBS_skip(&strict.modulus, 1);
-  Require(Same(strict.modulus, record.modulus, record.modulus_length), "the modulus");
+  Require(Same(strict.modulus, record.modulus, record.modulus_length),
+          "both readers find the same modulus");
 }

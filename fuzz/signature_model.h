@@ -8,7 +8,8 @@
 // Returns the signer's key if libcrypto's arithmetic finds both signatures of the block good.
 // Otherwise returns no bytes. The record points at the signed bytes, the key and the signatures.
 // The result is also empty if one of these is not in the block, if the key does not have 16 to 512
-// bytes, or if its exponent is 1 or -1. Anyone can forge signatures for such a key.
+// bytes, or if its exponent is 1 or -1. With these exponents, anyone can forge the key's
+// signatures.
 Bytes VerifiedKey(const pkcs7& record, const Bytes& block, const Bytes& signature_file);
 
 // Requires that the record has the same signed bytes, signatures, modulus and exponent as a strict

@@ -16,8 +16,9 @@ inline constexpr char kFuzzKey[] = "rsa-512";
 // fuzz key's, or if its exponent has no inverse.
 void SignAgain(Bytes& block, const Bytes& signature_file);
 
-// Writes the correct digests into the text. The length of the text does not change. Replaces each
-// "SHA1-Digest" and "SHA-256-Digest" (followed by `suffix`) in the section that names `name` by the
-// data's digest. An empty `name` means the whole text.
+// Writes the correct digests into the text. The length of the text does not change. Only the
+// section with the name `name` is changed, or the whole text if `name` is empty. There, each
+// "SHA1-Digest" and "SHA-256-Digest" gets the digest of `data` as its value. `suffix` follows these
+// attribute names, as in "SHA1-Digest-Manifest".
 void DigestAgain(std::string& text, const std::string& name, const std::string& suffix,
                  const Bytes& data);

@@ -1,7 +1,7 @@
-// Compares the verdict on an invented run of an invented package with the calls to the kernel and
-// its answers. If the verdict says that the kernel got a key, the kernel must have got this key.
-// The verdict must not name more signed things than the kernel signed, and must report every
-// failure. The shown text must agree with the verdict.
+// Invents a package and a run of the tool on it. Compares the simulator's verdict with the answers
+// that the kernel gave in this run. If the verdict says that the kernel got a key, the kernel must
+// have got this key. The verdict must not name more signed things than the kernel signed, and must
+// report every failure. The shown text must agree with the verdict.
 #include <algorithm>
 #include <sstream>
 #include <string>
@@ -45,7 +45,7 @@ class Input {
   const uint8_t* const end_;
 };
 
-// The journal of a run, and the facts that the judge needs.
+// The journal of a run, and the facts with which the functions below compare the verdict.
 struct Run {
   std::string journal = Event("start").Text("file", "base.apk").Text("path", kPaths[0]).Line();
   std::vector<std::string> granted;  // the payloads of what the kernel signed
@@ -194,7 +194,7 @@ void JudgeItems(const Run& run, const Report& report) {
     const bool is_registered = std::find(names.begin(), names.end(), item.name) != names.end();
     Require(item.kind != ItemKind::kKey || is_registered, "libzu accepted this key");
   }
-  Require(done <= run.granted.size(), "at most as many items as the kernel signed");
+  Require(done <= run.granted.size(), "the report has no more signed items than the kernel signed");
 }
 
 void JudgeVerdict(const Run& run, const PackageFacts& facts, const Report& report) {
@@ -225,7 +225,7 @@ void JudgeShown(const Report& report) {
   Require(digest.empty() || head.compare(key + 6, 8, digest, 0, 8) == 0, "this key is shown");
   const bool is_got = all.str().find("what the kernel got") != std::string::npos;
   Require(is_got == (report.key && report.key->was_got),
-          "a key is called the kernel's only if the kernel got it");
+          "the text says that the kernel got the key only if it did");
   const bool is_alarmed = HasWarning(report, cause::kCertificateOtherKey);
   Require(!is_alarmed || head.find("   ! ") != std::string::npos,
           "an alarm is in the verdict's line");

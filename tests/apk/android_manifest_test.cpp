@@ -227,8 +227,8 @@ TEST(AndroidManifestAttribute, AStringWithoutTextIsPassedOverForALaterString) {
             (Facts{"b", false}));
 }
 
-// The raw value is the text in the source. The typed value, which was compiled from that text,
-// counts.
+// An attribute's raw value is its text in the source. The typed value was compiled from this text.
+// Only the typed value counts.
 TEST(AndroidManifestAttribute, AnAttributeOfAnotherTypeIsMissingEvenWithARawText) {
   for (XmlAttribute attribute :
        {ReferenceAttribute("package", 0x7f010000), IntAttribute("package", 7)}) {
@@ -353,7 +353,7 @@ TEST(AndroidManifestDocument, OneThatTurnsBadAfterThePermissionKeepsIt) {
             (Facts{"", true}));
 }
 
-// The document's first `length` bytes, with its outer length adapted.
+// The document's first `length` bytes, with the length in its header set to `length`.
 Bytes CutTo(size_t length, const Bytes& document) {
   Bytes cut(document.begin(), document.begin() + static_cast<ptrdiff_t>(length));
   for (size_t i = 4; i < 8 && i < length; ++i) {
@@ -386,7 +386,7 @@ Bytes Replaced(Bytes document, const Bytes& old_bytes, const Bytes& new_bytes) {
   return document;
 }
 
-// For a name that does not end, the platform's library returns a length but no text.
+// If no NUL follows a name, the platform's library returns the name's length but no text.
 TEST(AndroidManifestDocument, AnElementWhoseNameDoesNotEndIsPassedOver) {
   CompiledXml xml;
   xml.Element("manifest", {Package("a")}).Element("permission", {AndroidName(kPermission)});

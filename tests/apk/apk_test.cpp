@@ -39,7 +39,7 @@ State StateOf(Apk& apk) {
   return {apk.IsGoodZip(), apk.IsApk(), apk.IsGoodApk(), result == 0};
 }
 
-// A package without a dex file, with this text as its manifest.
+// A package without a dex file, with this text as its META-INF/MANIFEST.MF.
 PackageOptions WithoutDexListedBy(const std::string& text) {
   PackageOptions options = WithoutDex();
   options.edit_manifest = [=](const std::string&) { return text; };
@@ -259,7 +259,7 @@ TEST(ApkInit, ASecondInitForgetsTheFirstOnesDigests) {
   EXPECT_FALSE(open.apk.VerifyFileHash("lib/only.so", disk.path()));
 }
 
-// Verification of the second package ends after its manifest has been loaded.
+// The verification of the second package fails after its META-INF/MANIFEST.MF was loaded.
 TEST(ApkInit, ASecondInitThatFailsAfterLoadingItsManifestHasNoDigests) {
   PackageOptions first = WithoutDex();
   first.entries.push_back({"lib/only.so", ToBytes("only")});
@@ -292,8 +292,8 @@ TEST(ApkInit, APackageWithoutManifestIsNotGoodAndLogsNothing) {
   EXPECT_EQ(StateOf(open.apk), (State{true, true, false, true}));
 }
 
-// The manifest is read first. If it is missing, nothing is logged about the signature file and its
-// block.
+// META-INF/MANIFEST.MF is read first. If it is missing, nothing is logged about the signature file
+// and the signature block.
 TEST(ApkInit, APackageWithoutManifestAndBlockLogsNothing) {
   Package package = MakePackage(WithoutDex());
   package.Remove(kManifestName);
@@ -354,7 +354,7 @@ TEST(ApkInit, AnAndroidManifestThatIsNotCompiledXmlIsReported) {
   EXPECT_EQ(StateOf(open.apk), (State{true, true, false, true}));
 }
 
-// The Android manifest is read only after the manifest has been loaded.
+// AndroidManifest.xml is read only after META-INF/MANIFEST.MF was loaded.
 TEST(ApkInit, AnAndroidManifestIsReadOnlyAfterTheManifestWasLoaded) {
   PackageOptions options = WithoutDexListedBy("Key:x");
   options.secure_storage = true;

@@ -28,7 +28,7 @@ void PrintTo(const Decoded& decoded, std::ostream* out) {
 
 constexpr uint8_t kUntouched = 0xEE;
 
-// Decodes `text` into a buffer of `room` bytes. Unreadable memory follows both buffers.
+// Decodes `text` into a buffer of `room` bytes. Unreadable memory follows the text and the buffer.
 Decoded Decode(const std::string& text, size_t room) {
   const GuardedBytes in(ToBytes(text));
   GuardedBytes out(Bytes(room, kUntouched));
@@ -92,8 +92,8 @@ TEST(Base64Decode, TextWithASpaceBecomesEmpty) {
   EXPECT_EQ(Bytes(), Base64Decode("QUJD "));
 }
 
-// Each byte value is appended to a whole group. An accepted byte is skipped, ends the text, or is a
-// left-over value. Every other byte is refused.
+// Each byte value is appended to a whole group of four characters. An accepted byte is skipped,
+// ends the text, or is a left-over value. Every other byte is refused.
 TEST(Base64Decode, OnlyBytesWithAMeaningAreAccepted) {
   const std::string accepted =
       "ABCDEFGHIJKLMNOPQRSTUVWXYZabcdefghijklmnopqrstuvwxyz0123456789+/=\r\n" + std::string(1, 0);

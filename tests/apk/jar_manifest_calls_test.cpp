@@ -132,8 +132,8 @@ size_t ComparisonsOfFinding(const std::vector<std::string>& names) {
 }
 
 // Each comparison of two entry names also compares a few attribute names. If the entry names are in
-// order, the wanted name is compared with about log2(4096) of them. Otherwise, the wanted name is
-// compared only with the entry name of the same hash.
+// order, the wanted name is compared with about log2(4096) = 12 entry names. Otherwise, the wanted
+// name is compared only with the entry name of the same hash.
 TEST_F(JarManifestCalls, NamesInOrderAreNotHashed) {
   std::vector<std::string> names = ShortNames(4096);
   const size_t in_order = ComparisonsOfFinding(names);

@@ -244,7 +244,7 @@ TEST(ManifestMf, NameThatRunsIntoTheEndOfTheTextFails) {
 }
 
 // The message contains the whole name, or as much of it as fits in a log record: 1024 bytes with a
-// NUL at the end.
+// NUL at the end. Without the name, the message takes 66 bytes.
 TEST(ManifestMf, NameThatRunsIntoTheEndOfTheTextIsToldAtAnyLength) {
   const std::string before = "Parse manifest: Error: P_KEY: unexpected end of file after key '";
   std::string name;
@@ -311,7 +311,7 @@ TEST(ManifestMf, LoneLineFeedAfterAValueLosesNothing) {
   EXPECT_EQ(Sections({{{"A", "1"}, {"Name", "x"}}}), Parse("A: 1\nName: x\n\n"));
 }
 
-// The second LF counts as the line break, and "Name" follows in the same section.
+// The second LF after "A:" counts as the line break, and "Name" follows in the same section.
 TEST(ManifestMf, EmptyLineAfterAColonAndALoneLineFeedIsNotSeen) {
   EXPECT_EQ(Sections({{{"B", "1"}, {"Name", "x"}}}), Parse("B: 1\nA:\n\nName: x\n\n"));
 }
@@ -392,7 +392,8 @@ TEST(ManifestMf, NulAtTheEndOfTheTextEndsAValueOnly) {
   ExpectNoColon(Text("A: 1\r\n\r\n\0"), "", {{{"A", "1"}}});
 }
 
-// The parser ends on every prefix, and finds only the first sections of the whole text.
+// For every prefix of the text, the parser ends, and finds only the first sections of the whole
+// text.
 TEST(ManifestMf, EveryPrefixOfAManifestEnds) {
   LogCapture log;
   const std::string text = "A: 1\r\n 2\r\n\r\nB:\nC: 3\n\nD:\r\n v\r\r";

@@ -15,7 +15,7 @@ namespace {
 
 using Pairs = std::vector<std::pair<std::string, std::string>>;
 
-// Sections of the test's own attributes, and the text that they point into.
+// A table of sections, and the text that its attributes point into.
 class Table {
  public:
   // Reserves `room` bytes, so that the text does not move when it grows.

@@ -16,9 +16,9 @@
 
 namespace {
 
-constexpr long kMegabyte = 1 << 10;  // kilobytes
+constexpr long kMegabyte = 1 << 10;  // in kilobytes
 
-// The freed memory that AddressSanitizer keeps for a while.
+// The freed memory that AddressSanitizer keeps for a while, in kilobytes.
 #ifndef __has_feature
 #define __has_feature(feature) 0
 #endif
@@ -59,7 +59,7 @@ long GrowthOfOpening(const Bytes& archive) {
   return PeakGrowth([&] { return !OpenPackage(archive).apk.IsApk(); });
 }
 
-constexpr long kLittleMemory = 100 * kMegabyte;  // for a false length of 4 GB
+constexpr long kLittleMemory = 100 * kMegabyte;  // the limit if a package declares 4 GB
 
 TEST(ApkMemory, GarbageThatDeclaresGigabytesTouchesLittle) {
   ZipItem item{kAndroidManifestName, {}, true};
@@ -122,7 +122,7 @@ Bytes DocumentOfOverlappingStrings() {
   uint32_t count = 0;
   for (uint32_t at = 0; at + 4 < kText; at += 4) {
     const uint32_t length = kText - 1 - (at + 4);
-    if ((length & 0xff) == 0 || (length & 0xff) > 0x7f) continue;  // not ASCII
+    if ((length & 0xff) == 0 || (length & 0xff) > 0x7f) continue;  // NUL, or not ASCII
     for (uint32_t i = 0; i < 4; i += 2) {
       text[at + i] = static_cast<uint8_t>(0x80 | length >> 8);
       text[at + i + 1] = static_cast<uint8_t>(length & 0xff);

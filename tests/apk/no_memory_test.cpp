@@ -19,8 +19,9 @@ TEST(VerifyCertificate, AKeyThatFindsNoMemoryIsReportedWithItsCode) {
                                     Error("file not verified: META-INF/CERT.SF\n")}));
 }
 
-// If a later allocation fails, the verification of the certificate fails. If a still later one
-// fails, the verification of the data fails.
+// The allocations after the first belong to the verification of the certificate, and then to the
+// verification of the data. If one of these allocations fails, the verification that it belongs to
+// fails.
 TEST(VerifyCertificate, AVerificationThatFindsNoMemoryIsReportedWithItsCode) {
   const Bytes archive = MakePackage().Build();
   int certificates = 0, signatures = 0;

@@ -91,8 +91,9 @@ TEST(VerifyCertificate, ASignatureOverOtherBytesFails) {
                      Error(kNotVerified)}));
 }
 
-// The bytes that are read as the signature start with the contents of the
-// digestEncryptionAlgorithm. They have no valid padding, even if the real signature is good.
+// The signature is found by its position (crypto/pkcs7.cpp), and the attributes move every later
+// element by one place. The bytes that are read as the signature therefore start with the contents
+// of the digestEncryptionAlgorithm. They have no valid padding, even if the real signature is good.
 TEST(VerifyCertificate, AuthenticatedAttributesFail) {
   SignatureBlock block;
   block.authenticated_attributes = true;
@@ -100,7 +101,8 @@ TEST(VerifyCertificate, AuthenticatedAttributesFail) {
             Records({Error("RSA could not verify data: 7\n"), Error(kNotVerified)}));
 }
 
-// A block whose certificate has this RSAPublicKey, and a signature of this length.
+// Returns a block with one certificate. Its public key has this modulus and this exponent, and the
+// certificate's own signature has `signature_length` bytes.
 SignatureBlock WithPublicKey(const Bytes& modulus, const Bytes& exponent, size_t signature_length) {
   Certificate certificate;
   certificate.public_key_info =
@@ -117,8 +119,9 @@ TEST(VerifyCertificate, AKeyOf2048BytesAlreadyFailsAtTheCertificate) {
 }
 
 TEST(VerifyCertificate, AnEmptyKeyFailsAtTheCertificate) {
-  // The INTEGER of two bytes, 0 and 1, is the one-byte modulus 1. The length of two bytes also
-  // limits the exponent's element.
+  // The INTEGER of the modulus has the two bytes 0 and 1, because its length is also the limit for
+  // the exponent's element, and the header of the exponent has two bytes. The modulus is read
+  // without the leading zero, so it has one byte.
   EXPECT_EQ(LogOf(WithBlock(WithPublicKey({0, 1}, {}, 256))),
             Records({Error("RSA could not verify certificate: 5\n"), Error(kNotVerified)}));
 }
@@ -132,8 +135,9 @@ TEST(VerifyCertificate, AnExponentThatRunsIntoTheModulusLengthStaysInTheBlock) {
 }
 
 TEST(VerifyCertificate, AModulusThatEndsWithTheBlockIsRead) {
-  // The second half of the exponent sets the length of the modulus. The modulus first ends at the
-  // block's last byte, and then one byte later.
+  // The fifth to the eighth byte of the exponent overwrite the length of the modulus
+  // (crypto/pkcs7.h). In the first check, the modulus ends with the block's last byte. In the
+  // second check, it ends one byte later.
   const auto block_with_length = [](uint32_t length) {
     Bytes exponent = FromHex("01000100");
     for (int i = 0; i < 4; ++i) exponent.push_back(static_cast<uint8_t>(length >> (8 * i)));
@@ -166,7 +170,8 @@ TEST(VerifyCertificate, ASignatureThatTheBlockEndsBeforeFails) {
             Records({Error("RSA could not verify data: 5\n"), Error(kNotVerified)}));
 }
 
-// A package whose block has the result of `encode` as its signature.
+// Returns the options for a package. The signature in its block is the result of `encode` for a
+// good signature.
 template <typename Encode>
 PackageOptions WithEncodedSignature(Encode encode) {
   PackageOptions options;
@@ -198,7 +203,8 @@ TEST(VerifyCertificate, AShorterSignatureStringAtTheBlocksEndFails) {
             Records({Error("RSA could not verify data: 5\n"), Error(kNotVerified)}));
 }
 
-// The result of VerifyCertificate for a block that signs `covered`, with the digests of `claimed`.
+// Calls VerifyCertificate for a block that signs `covered`, with the digests of `claimed`. `key` is
+// "before" if the call did not change it.
 struct Verification {
   bool verified;
   Bytes key;

@@ -1,4 +1,5 @@
-// Tests the adapter to the zip library, for both generations of the library.
+// Tests the adapter to the zip library, for both generations of the library: names are `ZipString`
+// in the older one and std::string_view in the later one.
 #include "apk/zip_library.h"
 
 #include <gtest/gtest.h>
@@ -9,7 +10,7 @@ using namespace ApkTools;
 
 namespace {
 
-// A name of the older generation: a pointer and a 16-bit length.
+// Stands for `ZipString`, the older generation's type for names.
 struct OlderName {
   const uint8_t* name;
   uint16_t name_length;

@@ -1,9 +1,11 @@
 // In a build with _FORTIFY_SOURCE, as in every platform tree, Bionic's headers give some calls
-// another name. The preset `fortify` does the same here, to check that the tests wrap these names,
-// too. The workstation's C library has the same functions, but its headers rarely call them.
+// another name. For example, read becomes __read_chk. The preset `fortify` does the same here, to
+// check that the tests also replace the calls under these names (--wrap). The workstation's C
+// library has the same functions, but its headers rarely call them.
 //
-// The compiler's -include puts this before everything else in every file. A function whose
-// parameter carries an object's size is an overload of the library's function, and is preferred.
+// The preset includes this header at the start of every source (-include). Each function below is
+// an overload of a C library's function, because it has a pass_object_size parameter. The compiler
+// prefers this overload because of enable_if.
 #pragma once
 
 #include <fcntl.h>

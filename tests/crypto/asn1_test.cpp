@@ -25,7 +25,7 @@ int Read(const Bytes& bytes, asn1_hdr* hdr) {
   return asn1_get_next(bytes.data(), bytes.size(), hdr);
 }
 
-// A header whose fields all have old values.
+// A header with 0xee in every byte. It shows which fields a call sets.
 asn1_hdr Used() {
   asn1_hdr hdr;
   memset(&hdr, 0xee, sizeof(hdr));
@@ -134,8 +134,8 @@ TEST(Asn1GetNext, LongFormTagMayHaveOneOctet) {
 
 TEST(Asn1GetNext, LongFormTagKeepsItsLow32Bits) {
   // Ten octets have 70 bits. The low 32 bits are 0x11223344, and all bits above are ones. In groups
-  // of seven bits, 0x11223344 is 0001 0001001 0001000 1100110 1000100. With the ones above, the
-  // first of these groups is 1110001, and its octet is 0xf1.
+  // of seven bits, 0x11223344 is 0001 0001001 0001000 1100110 1000100. The three bits above fill
+  // the first of these groups with ones: 1110001. Its octet is 0xf1.
   asn1_hdr hdr;
   EXPECT_EQ(Read(FromHex("1f ff ff ff ff ff f1 89 88 e6 44 00"), &hdr), 0);
   EXPECT_EQ(hdr.tag, 0x11223344u);
@@ -281,8 +281,9 @@ TEST(Asn1ParseOid, FirstValueIsSplitAtFortyAndEighty) {
 }
 
 TEST(Asn1ParseOid, LargeFirstValueIsSplitBeforeItIsCut) {
-  // The value is 2^32 + 80 = 0x100000050, in groups of seven bits 10000 0000000 0000000 0000000
-  // 1010000. The second arc is the value minus 80: 2^32, and its low 32 bits are 0.
+  // The value is 2^32 + 80 = 0x100000050. In groups of seven bits, it is 10000 0000000 0000000
+  // 0000000 1010000. The second arc is the value minus 80, which is 2^32. The low 32 bits of 2^32
+  // are 0.
   const Bytes contents = FromHex("90 80 80 80 50");
   asn1_oid oid;
   EXPECT_EQ(asn1_parse_oid(contents.data(), contents.size(), &oid), 0);
@@ -434,7 +435,8 @@ TEST(Asn1BitStringToLong, LastBitOfTheFirstByteIsBitSeven) {
 }
 
 TEST(Asn1BitStringToLong, BytesGoUpwardsWithTheirBitsReversed) {
-  // 12 = 00010010 -> 01001000 = 48; 34 = 00110100 -> 2c; 56 = 01010110 -> 6a; 78 -> 1e.
+  // Each byte is reversed (numbers in hexadecimal): 12 = 00010010 -> 01001000 = 48; 34 = 00110100
+  // -> 2c; 56 = 01010110 -> 6a; 78 -> 1e.
   EXPECT_EQ(asn1_bit_string_to_long(FromHex("00 12 34 56 78").data(), 5), 0x1e6a2c48u);
 }
 

@@ -10,8 +10,8 @@ namespace {
 
 constexpr int kRounds = 150000;
 
-// Half of the dividends are random. The others are next to a multiple of the divisor, where
-// estimates of a digit fail.
+// Half of the dividends are random. The others are next to a multiple of the divisor, where the
+// estimate of a quotient digit is most often wrong.
 TEST(MpiModMpi, IsTheNonNegativeRemainder) {
   Operands operands;
   for (int round = 0; round < kRounds; ++round) {
@@ -97,10 +97,11 @@ TEST(MpiModMpi, OfTwoToThe8192ForAModulusOf128Limbs) {
   EXPECT_EQ(mpz_class(PowerOfTwo(8192) % Value(N)), Value(RR));
 }
 
-// d, the top limb of the divisor, is 8000ffff. The half digit of 48000000 0000 is estimated as
-// 9000, with remainder 0. The remainder must not be below 9000 * ffff, so d is added to it. The sum
-// is d itself: it did not wrap, and d must be added again. Code that stops after the first addition
-// gets a digit that is far too large, and counts it down by ones.
+// The numbers are hexadecimal. d, the top limb of the divisor, is 8000ffff. The half digit of
+// 48000000 0000 is estimated as 9000, with remainder 0. d is added to the remainder until the sum
+// wraps or is at least 9000 * ffff. The first sum is d itself. It did not wrap, so d must be added
+// again. Code that stops after the first addition gets a digit that is far too large, and then
+// reduces the digit by one at a time.
 TEST(MpiModMpi, EndsAtOnceIfTheRemainderEqualsTheDivisor) {
   const Number A({0x12345678, 0x0000abcd, 0x48000000});
   const Number B({0xfedcba98, 0x8000ffff});

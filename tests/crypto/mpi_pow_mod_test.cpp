@@ -113,7 +113,8 @@ TEST(MpiMontmul, OfAProductThatTheModulusDividesIsZero) {
   }
 }
 
-// With N = 2^32 - 1 the product is A * B mod N, because R mod N is 1.
+// With N = 2^32 - 1, R = 2^32 is 1 modulo N. The Montgomery product A * B / R is therefore A * B
+// modulo N.
 TEST(MpiMontmul, SubtractsAlsoWhereTheProductIsBelowTheModulus) {
   const Number N({UINT32_MAX});
   Number A({3, 0});
@@ -121,8 +122,9 @@ TEST(MpiMontmul, SubtractsAlsoWhereTheProductIsBelowTheModulus) {
   Number T(Limbs(4));
   mpi_montmul(&A, &B, &N, 1, &T);
   EXPECT_EQ(15, Value(A));
-  // The lower scratch limb contained A's old limb, 3. The upper one contained the product, 15. The
-  // extra subtraction left 3 - 15 in the lower limb, and borrowed 1 from the upper limb.
+  // The lower limb of T contained A's old limb, 3. The upper limb contained the product, 15. The
+  // product was then subtracted from T. This left 3 - 15 in the lower limb, and borrowed 1 from the
+  // upper limb.
   EXPECT_EQ(static_cast<uint32_t>(3 - 15), T.p[0]);
   EXPECT_EQ(14u, T.p[1]);
 }

@@ -402,7 +402,7 @@ TEST(Mpi, ReportsEachAllocationThatFails) {
     Number R;
     return mpi_mod_mpi(&R, &A, &B);
   });
-  // The remainder is negative at first.
+  // A is negative, so its remainder is negative until the divisor is added.
   const Number divisor({7, 0xffff});
   ExpectNoMemoryAtEveryAllocation([&] {
     Number R;

@@ -1,4 +1,5 @@
-// Tests processCert with the first SignerInfo and with damaged blocks.
+// Tests how processCert reads the first SignerInfo. Also tests that processCert stays inside
+// damaged blocks.
 #include <gtest/gtest.h>
 
 #include <cstdlib>
@@ -69,7 +70,8 @@ TEST(ProcessCertSigner, UnreadableHeadersGiveTheUnreadableLine) {
 }
 
 TEST(ProcessCertSigner, SignersThatWouldStartBeyondTheEndGiveTheUnreadableLine) {
-  // The [0] of the certificates ends the block. Its length is five bytes greater than its contents.
+  // The block ends with the [0] of the certificates. The length in the header of the [0] is five
+  // bytes greater than its contents.
   const Bytes certificate = *WithRsaKey(Bytes(64, 0x77), {3}).certificates;
   Bytes certificates = der::Context(0, Concat({certificate, Bytes(5)}));
   certificates.resize(certificates.size() - 5);
@@ -97,7 +99,8 @@ TEST(ProcessCertSigner, SignersAndTheirFirstMayEndWithTheBlock) {
 TEST(ProcessCertSigner, VersionAndIssuerMayEndWithTheBlock) {
   // The SignerInfo is empty. The version and the issuer are read from the bytes after it, and the
   // digestAlgorithm is missing. In the first and the third case, the issuer ends with the block.
-  // The second case has a version that is one byte longer, and the fourth case has such an issuer.
+  // The second case is the first one with a version that is one byte longer. The fourth case is the
+  // third one with an issuer that is one byte longer.
   const std::pair<const char*, const char*> cases[] = {
       {"31 00 30 00 02 03 01 02 03 30 00", kNoAlgorithm},
       {"31 00 30 00 02 04 01 02 03 30 00", kUnreadable},
@@ -132,8 +135,9 @@ TEST(ProcessCertSigner, MalformedDigestAlgorithmGivesItsLine) {
 }
 
 TEST(ProcessCertSigner, DigestAlgorithmMustEndWithinTheSignerInfo) {
-  // Four blocks that differ only in the length of the SignerInfo. It ends one byte before the
-  // digestAlgorithm, at its start, one byte before its end, and at its end.
+  // Four blocks that differ only in the length of the SignerInfo. The SignerInfo ends one byte
+  // before the start of the digestAlgorithm, at this start, one byte before the end of the
+  // digestAlgorithm, and at this end.
   const Bytes start = Concat({der::Integer(1), der::Sequence({})});
   const Bytes rest = Concat({AlgorithmIdentifier("1.2.3"), der::OctetString(Bytes(8, 1))});
   const size_t algorithm_end = start.size() + Sha256Algorithm().size();
@@ -215,7 +219,8 @@ TEST(ProcessCertSigner, AuthenticatedAttributesGiveTheWrongElement) {
   const ProcessedBlock processed(block);
   EXPECT_EQ(processed.result, 0);
   EXPECT_EQ(processed.output, "");
-  // The contents of the digestEncryptionAlgorithm: rsaEncryption and NULL.
+  // The digestEncryptionAlgorithm is read as the encryptedDigest. Its contents are rsaEncryption
+  // and NULL.
   EXPECT_EQ(Field(processed.record.signed_digest, processed.record.signed_digest_length),
             Concat({der::Oid("1.2.840.113549.1.1.1"), der::Null()}));
 }
@@ -231,8 +236,8 @@ TEST(ProcessCertBounds, EveryTruncationIsRefused) {
 }
 
 TEST(ProcessCertBounds, EveryTruncationOfABlockOfIndefiniteLengthsStaysInside) {
-  // The SignerInfo ends with its digestAlgorithm. It can therefore still be read if the block is
-  // cut after that element.
+  // By its length, the SignerInfo ends with the digestAlgorithm. A block that is cut after this
+  // element may therefore still be accepted, so this test does not check the result.
   const Bytes whole = BlockEndingInSigners(Concat({
       FromHex("31 80 30 14 02 01 01 30 80"),
       Sha256Algorithm(),

@@ -113,8 +113,8 @@ TEST(ProcessCertHeader, TagIsPrintedAsASignedNumber) {
 }
 
 TEST(ProcessCertHeader, HeaderThatWouldStartAtOrBeyondTheEndHasTagZero) {
-  // In the first case, the contentType ends at the end of the block. In the second, it ends two
-  // bytes later.
+  // In the first case, the contentType ends at the end of the block. In the second case, it would
+  // end two bytes beyond the end of the block.
   for (const char* digits : {"30 03 06 01 2a", "30 03 06 03 2a"}) {
     const ProcessedBlock processed(FromHex(digits));
     EXPECT_EQ(processed.result, 1);
@@ -204,7 +204,8 @@ TEST(ProcessCertKey, UnreadableKeyGivesTheUnreadableLine) {
   }
 }
 
-// The rest of the key follows its BIT STRING, in a part of the tbsCertificate that is not read.
+// The BIT STRING has only the first `length` bytes of the key. The rest follows the BIT STRING, in
+// a part of the tbsCertificate that is not read.
 TEST(ProcessCertKey, KeyEndsWithItsBitString) {
   const Bytes key = der::Sequence({der::Integer(Bytes(64, 0x77)), der::Integer(3)});
   for (size_t length = 0; length <= key.size(); ++length) {
@@ -293,7 +294,8 @@ TEST(ProcessCertKey, ExponentIsComparedWithTheLengthOfTheModulus) {
   EXPECT_EQ(processed.record.modulus_length, 4u);
 }
 
-// The record leaves out the leading zero of the modulus, but the comparison counts it: five bytes.
+// With its leading zero, the modulus has five bytes. The record leaves out the zero, but the
+// comparison counts it.
 TEST(ProcessCertKey, ExponentIsComparedWithTheLengthOfTheModulusAsWritten) {
   const ProcessedBlock processed(WithRsaKey(Concat({{0x00}, Bytes(4, 0x77)}), {1, 0, 1}));
   EXPECT_EQ(processed.result, 0);

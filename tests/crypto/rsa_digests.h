@@ -1,4 +1,5 @@
-// The digests that the signatures in the RSA tests cover.
+// The digests that the signatures in the RSA tests cover, and Verify, which checks a signature with
+// all three.
 #pragma once
 
 #include "crypto/rsa.h"

@@ -1,5 +1,5 @@
-// Tests rsa_pkcs1_verify with signatures from libcrypto, and with blocks made by hand, to which the
-// test applies only the private-key operation.
+// Tests rsa_pkcs1_verify with signatures from libcrypto, and with blocks made by hand. The tests
+// sign these blocks as they are, with only the private-key operation.
 #include "crypto/rsa.h"
 
 #include <gtest/gtest.h>
@@ -227,7 +227,8 @@ TEST(RsaPkcs1Verify, PaddingWithoutASeparatorIsInvalid) {
 }
 
 // The verifier recovers both blocks at the same place on the stack, the longer block first. The
-// longer block has a zero right after the place where the shorter block ends.
+// longer block has a zero right after the place where the shorter block ends. A verifier that read
+// beyond the shorter block would find this zero, and would log an error.
 TEST(RsaPkcs1Verify, PaddingThatRunsToTheLastByteIsNotReadBeyondIt) {
   const FixedKey longer("rsa-2048");
   const FixedKey shorter("rsa-1024");

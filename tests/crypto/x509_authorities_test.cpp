@@ -123,7 +123,7 @@ std::vector<std::string> OpensslNameLines(const std::vector<std::string>& lines,
     const size_t equals = line->find("=#");
     const auto type = types.find(line->substr(4, equals - 4));
     if (type == types.end()) continue;
-    // A string of fewer than 128 bytes has two header octets.
+    // A string of fewer than 128 bytes has two header octets, which are four digits.
     kept.push_back(std::to_string(type->second) + " " + line->substr(equals + 2 + 4));
   }
   return kept;

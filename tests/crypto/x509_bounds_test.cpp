@@ -82,7 +82,7 @@ TEST(X509RunningOn, ElementsOfANameAreMinus12) {
   EXPECT_EQ(ResultOf(WithSubject(der::Sequence({der::Set({attribute})}))), 0);
   const Bytes cases[] = {
       der::Sequence({RunningOn(der::Set({attribute}))}),                        // the SET
-      der::Sequence({der::Set({RunningOn(attribute)})}),                        // its contents
+      der::Sequence({der::Set({RunningOn(attribute)})}),                        // its SEQUENCE
       der::Sequence({der::Set({der::Sequence({type, RunningOn(Value())})})}),   // a value
       der::Sequence({der::Set({der::Sequence({RunningOn(type, 7)}), Value()})}  // a type
                     )};
@@ -117,7 +117,7 @@ TEST(X509RunningOn, ElementsOfANameMayNotTakeBytesAfterTheirContainer) {
 }
 
 // The second time lacks its end. The subject after it has 90 bytes of contents, so it starts with
-// 30 5a. As text, these bytes are "0Z".
+// 30 5a. As text, these bytes are "0Z", which would complete the time.
 TEST(X509RunningOn, TimeIsMinus13) {
   Certificate certificate = WithSubject(Name({{kCommonName, std::string(79, 'x')}}));
   ASSERT_EQ(certificate.subject[0], '0');
@@ -158,7 +158,7 @@ TEST(X509RunningOn, KeyBehindItsInfoIsMinus14) {
   }
 }
 
-// An Extension follows the [3].
+// An Extension follows the [3]. A SEQUENCE of extensions that is too long would include it.
 TEST(X509RunningOn, SequenceOfExtensionsIsMinus15) {
   const Bytes extension = Extension(kUnknown, der::Null());
   const Bytes extensions = der::Sequence({extension});
@@ -180,8 +180,8 @@ TEST(X509RunningOn, ElementsOfAnExtensionAreMinus15) {
   const Bytes value = der::OctetString(DigitalSignature());
   EXPECT_EQ(ResultOfExtensions({der::Sequence({der::Oid(kKeyUsage), value})}), 0);
   EXPECT_EQ(ResultOfExtensions({der::Sequence({der::Oid(kKeyUsage), RunningOn(value)})}), -15);
-  // The header after the flag is read from the flag's own byte, 04, on. The OCTET STRING is
-  // therefore 04 04 03 02 05 a0.
+  // The parser reads the header after the flag from the flag's own byte, 04. It therefore reads the
+  // OCTET STRING 04 04 03 02 05 a0.
   const Bytes id = Concat({der::Oid(kKeyUsage), der::Boolean(4)});
   const Bytes whole = FromHex("04 03 02 05 a0");
   const Bytes cut = FromHex("04 03 02 05");

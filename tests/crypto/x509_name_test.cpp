@@ -243,7 +243,7 @@ TEST(X509Time, BothTimesAreRead) {
 
 TEST(X509Time, OtherLengthsAreMinus13) {
   // Without seconds, with a fraction of a second, with an offset, empty, and with the length of the
-  // other form. The UTCTime also with one digit too many.
+  // other form. The last UTCTime has one digit too many.
   for (const char* text : {"2001020304Z", "200102030405.5Z", "200102030405+0100", "",
                            "20200102030405Z", "2001020304050Z"}) {
     NotBefore(der::kUtcTime, text, -13);

@@ -38,7 +38,7 @@ void* __libc_realloc(void* block, size_t size);
 namespace {
 
 char function[32];
-long calls_left = -1;  // including the one that fails; 0 or less: none fails
+long calls_left = -1;  // up to and including the call that fails; 0 or less: no call fails
 const char* report = nullptr;
 
 // True if the code at `address` is part of the shared library whose path contains `name`.

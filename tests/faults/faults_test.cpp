@@ -1,6 +1,6 @@
 // Makes each call of the tool to certain C library functions fail, one per run. The tool must end
-// normally, or because a container without memory aborts. It must never get anything signed that
-// was not verified.
+// normally, or abort because a container gets no memory. The kernel must never sign a file that the
+// tool did not verify.
 #include <fcntl.h>
 #include <gtest/gtest.h>
 #include <signal.h>
@@ -59,8 +59,9 @@ class Installed {
   struct Outcome {
     ToolEnd ending;
     bool failed;  // the call that must fail was made
-    // The grants, in order, one letter each: L the library, P the package, K its key (N: under an
-    // empty name), J a JAR.
+    // What the kernel signed and libzu registered, in order, one letter each. L: the library. P:
+    // the package. J: a JAR. K: the package's key. N: the key under an empty name. ?: anything
+    // else.
     std::string grants;
     std::string errors;
   };
@@ -120,12 +121,12 @@ bool IsExit0(const ToolEnd& ending) {
 }
 
 // The expected grants, one text per run. The function's first call fails in the first run, its
-// second call in the second run, and so on.
+// second call in the second run, and so on. The comments in the tables below name these calls.
 using Runs = std::vector<std::string>;
 using Table = std::map<std::string, Runs>;
 
-// Makes each call of the functions fail, one per run. In a last run for each function, the call
-// that must fail is never made. `all` are the grants of a run without a fault.
+// Makes each call of the functions fail, one per run. One more run for each function chooses a call
+// that the tool never makes. `all` are the grants of a run without a fault.
 void ExpectRuns(Installed& file, const std::string& all, const Table& table) {
   for (const auto& [function, runs] : table) {
     for (size_t call = 1; call <= runs.size() + 1; ++call) {
@@ -165,7 +166,7 @@ TEST(FaultsOfCalls, OnAGoodPackageCostTheirOwnStep) {
              {{"open", {"", "PK", "PK"}},     // the package; the library, to read it and to sign it
               {"read", {"PK"}},               // the library
               {"fopen", {"PK", "LK"}},        // the tool's integrity value, before each signing
-              {"fcntl", {"PK", "PK", "LK"}},  // the library kept open; both signings
+              {"fcntl", {"PK", "PK", "LK"}},  // keeps the library open; signs it; signs the package
               {"readlink", {"PK", "LPK"}},    // the libraries' directory; a message
               {"fstatvfs", {"LPK"}},          // the file system then counts as writable
               {"fgetxattr", {}}});            // only JARs have attributes
@@ -177,7 +178,7 @@ TEST(FaultsOfCalls, OnATrustedJarCostTheirOwnStep) {
              {{"open", {""}},
               {"read", {}},
               {"fopen", {""}},
-              {"fcntl", {"", ""}},  // its verification, its signing
+              {"fcntl", {"", ""}},  // the JAR's verification; its signing
               {"readlink", {"J"}},
               {"fstatvfs", {"J"}},
               {"fgetxattr", {"J"}}});
@@ -222,10 +223,10 @@ bool IsAbort(const ToolEnd& ending) {
   return ending.how == ToolEnd::How::kKilled && ending.value == SIGABRT;
 }
 
-// Makes each request for memory fail, one per run. A run may end with the abort of a container. The
-// grants are then the first letters of `all`, and never fewer than in an earlier run of this kind.
-// Any other run must end normally, with grants from `ways`: the tool and its libraries then handle
-// the missing memory.
+// Makes each request for memory fail, one per run. A run may end with the abort of a container. Its
+// grants must be the first letters of `all`, and at least as many as in each earlier run that
+// aborted. In any other run, the tool and its libraries handle the missing memory: the run must end
+// normally, and its grants must be one of `ways`.
 void ExpectRunsWithoutMemory(Installed& file, const std::string& all,
                              const std::set<std::string>& ways) {
   constexpr int kMostCalls = 20000;
@@ -252,9 +253,9 @@ void ExpectRunsWithoutMemory(Installed& file, const std::string& all,
 
 TEST(FaultsOfMemory, OnAGoodPackageCostTheLaterSteps) {
   Installed file = GoodPackage();
-  // In the order of the list: nothing is verified; no stream for the integrity value before the
-  // first signing, and before the second; no text for the permission; no text for the package's
-  // name, which is then empty; a request whose failure has no effect.
+  // The meaning of the texts in the list. "": nothing is verified. "PK" and "LK": the integrity
+  // value cannot be read before the first or the second signing. "LP": the permission is not found.
+  // "LPN": the package's name is empty. "LPK": the missing memory has no effect.
   ExpectRunsWithoutMemory(file, "LPK", {"", "PK", "LK", "LP", "LPN", "LPK"});
 }
 

@@ -8,8 +8,9 @@ import java.util.List;
 
 /**
  * PrintSignerDigests LEVEL FILE [JAR-SIGNER]: prints the SignerDigests of the signers that the package
- * manager of this API level finds for the package. With JAR-SIGNER, instead prints "true" if it is one
- * of these digests, else "false". Fails if the package manager would refuse the package.
+ * manager of this API level finds for the package. With JAR-SIGNER, a digest, instead prints "true" if
+ * JAR-SIGNER is one of these digests, else "false". Fails if the package manager would refuse the
+ * package.
  */
 public final class PrintSignerDigests {
     public static void main(String[] words) throws Exception {

@@ -77,7 +77,7 @@ TEST(RunProgram, ThatIsMissingIsNotStarted) {
   Expect(RunProgram({"/dev/null"}, {}), RunEnd::kNotStarted, 0);
 }
 
-// The standard streams of a shell before it redirects any.
+// Returns the files that are open as the standard streams of a shell, one path per line.
 std::string Streams() {
   const TempDir directory;
   const std::string file = directory / "output";
@@ -140,7 +140,7 @@ TEST(RunProgram, WithoutDescriptorsIsNotStarted) {
   Expect(run, RunEnd::kNotStarted, EMFILE);
 }
 
-// While SIGCHLD is ignored, the kernel drops the status.
+// While SIGCHLD is ignored, the kernel discards the child's exit status.
 TEST(RunProgram, WhoseStatusAnotherCallTookIsLost) {
   const auto before = signal(SIGCHLD, SIG_IGN);
   Expect(RunProgram({"/bin/true"}, {}), RunEnd::kLost, ECHILD);

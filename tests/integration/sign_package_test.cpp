@@ -33,7 +33,8 @@ class Phone : public testing::Test {
     return "exec '" + SimulatorPath() + "' --state '" + (data_ / "signed") + "' " + options;
   }
 
-  // Installs a golden package. The package manager's only signer is the package's own signer.
+  // Installs a package of make_golden_packages. The result names the package's JAR signer as the
+  // package manager's only signer.
   InstalledPackage Install(const std::string& name) const {
     fs::copy(Golden(name), data_ / name, fs::copy_options::recursive);
     return {data_ / (name + "/base.apk"), ContentOf(Golden(name) + "/digest").substr(0, 64)};
@@ -73,7 +74,7 @@ TEST_F(Phone, LeavesAPackageWithoutAJarSignatureAlone) {
   EXPECT_FALSE(IsTrusted(package.path));
 }
 
-// The signature file's signature is good, but the dex does not match.
+// The signature file's signature is good, but classes.dex does not match the manifest.
 TEST_F(Phone, DoesNotTrustAPackageThatTheToolRefuses) {
   const InstalledPackage package = Install("changed-dex");
   EXPECT_EQ(Sign(package), SignOutcome::kNotTrusted);
@@ -85,7 +86,7 @@ TEST_F(Phone, DoesNotTrustAPackageThatTheKernelRefuses) {
   EXPECT_EQ(Sign(Install("apksigner-sha256-2048")), SignOutcome::kNotTrusted);
 }
 
-// Simulates a kernel whose integrity value never settles.
+// Simulates a kernel that never settles the integrity value for which the tool waits.
 TEST_F(Phone, EndsARunThatTakesTooLong) {
   InstallProgram("apktoolkit", "exec sleep 60 #");
   RunLimits limits;
@@ -106,7 +107,7 @@ TEST_F(Phone, TellsOfProgramsThatAreMissing) {
   EXPECT_EQ(Sign(package), SignOutcome::kCannotBeRun);
 }
 
-// ---- The loop.
+// ---- apktoolkit-all, which signs each package of a list.
 
 class AfterAnUpdate : public Phone {
  protected:

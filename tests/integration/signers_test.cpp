@@ -1,5 +1,6 @@
-// Binding the signers, on both sides. The Java side finds the package manager's signers. The C++
-// side checks that the JAR signer, which apktoolkit uses, is one of them.
+// Tests how the signers of a package are compared. The Java side finds the package manager's
+// signers. The C++ side (apktoolkit-bound) checks that the JAR signer, which apktoolkit uses, is
+// one of them.
 #include <gtest/gtest.h>
 
 #include <filesystem>
@@ -37,7 +38,7 @@ std::string SignersOf(const std::string& apk, int level = 33) {
   return run.output.substr(0, run.output.find('\n'));
 }
 
-// Runs the C++ side with a command that prints that it ran.
+// Runs apktoolkit-bound with a command that prints "run for FILE".
 ProcessResult Bound(const std::string& digests, const std::string& file) {
   return RunProcess({APKTOOLKIT_BOUND_PATH, digests, "/bin/echo", "run for", file});
 }
@@ -165,7 +166,7 @@ TEST(Signers, OfFilesWithoutAGoodJarSignatureAreEmpty) {
   }
 }
 
-// Only a whole digest matches, and an empty list of signers never does.
+// Only a whole digest matches. An empty list of signers matches no package.
 TEST(Signers, AreComparedAsWholeDigests) {
   const std::string apk = Golden("apksigner-sha256-2048/base.apk");
   const std::string key = DigestOfKey("apksigner-sha256-2048");

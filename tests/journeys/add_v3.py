@@ -35,8 +35,8 @@ def main(path, certificate, key, first, last, scheme=V3):
     directory = struct.unpack_from("<I", data, end + 16)[0]
     has_block = data[directory - 16:directory] == MAGIC
     start = directory - struct.unpack_from("<Q", data, directory - 24)[0] - 8 if has_block else directory
-    # The digest covers the end record with the offset of the signing block in place of the
-    # directory's offset.
+    # The digest covers the end-of-central-directory record, but with the offset of the signing
+    # block in place of the central directory's offset.
     signed_end = data[end:end + 16] + struct.pack("<I", start) + data[end + 20:]
     digest = content_digest([data[:start], data[directory:end], signed_end])
 

@@ -31,7 +31,7 @@ std::string OfCertificate(const std::string& key, const std::string& command) {
   return text;
 }
 
-// In hexadecimal, in capitals and with colons.
+// The SHA-256 digest of the certificate: hexadecimal digits in capitals, with colons.
 std::string CertificateDigest(const std::string& key) {
   return OfCertificate(key, "openssl x509 -in \"$0\" -noout -fingerprint -sha256 | sed s/.*=//");
 }
@@ -54,7 +54,7 @@ ProcessResult Simulated(const Lines& words) {
   return RunProcess(command);
 }
 
-// The verdicts of the files, then the status. The installer is off, unless `words` turn it on.
+// The verdicts of the files, then the status. No phone's installer is asked, unless `words` say so.
 Lines Verdicts(Lines words) {
   words.insert(words.begin(), {"--installer=off", "--quiet"});
   const ProcessResult run = Simulated(words);
@@ -126,8 +126,8 @@ TEST(Signer, WhoWasNotExpectedStandsInFirstLineItemAndJournal) {
   EXPECT_NE(item["text"].get<std::string>().find(PublicKeyDigest("rsa-2048")), std::string::npos);
 }
 
-// Phones of API 28 and later install the package for the second key, but the kernel gets the first
-// key.
+// For phones of API 28 and later, the signer of the package rotated-key has the second key, but the
+// kernel gets the first key.
 TEST(Signer, OfTheNewestSchemeIsAskedOfTheInstaller) {
   const Lines first = {"--signer", ModulusDigest("rsa-2048")};
   const auto verdicts = [&](const Lines& more) {
@@ -140,7 +140,7 @@ TEST(Signer, OfTheNewestSchemeIsAskedOfTheInstaller) {
   EXPECT_EQ(verdicts({"--installer=required", "--signer", ModulusDigest("rsa-2048-other")}),
             Lines({"SIGNED, OTHER SIGNER", "-> 0"}));
   EXPECT_EQ(verdicts({"--installer=required", "--api", "27"}), Lines({"SIGNED", "-> 0"}));
-  // Without the installer, each newer signer that the file names has to be expected.
+  // If no installer is asked, --signer must also name each signer of the newer signatures.
   EXPECT_EQ(verdicts({}), Lines({"NOT ACCEPTED", "-> 1"}));
   EXPECT_EQ(verdicts({"--signer", ModulusDigest("rsa-2048-other")}), Lines({"SIGNED", "-> 0"}));
 }
@@ -163,7 +163,8 @@ TEST(Signer, OfATrustedJarIsNobody) {
 TEST(FilesOfOnePackage, MustHaveOneSigner) {
   EXPECT_EQ(Verdicts({Apk("apksigner-sha256-2048"), Apk("apksigner-sha1-2048")}),
             Lines({"SIGNED", "SIGNED", "-> 0"}));
-  // The files are compared in their order, also if several are processed at a time.
+  // The files are compared in the order of the command line, even if several are processed at a
+  // time.
   for (const char* jobs : {"--jobs=1", "--jobs=4"}) {
     EXPECT_EQ(Verdicts({jobs, Apk("apksigner-sha256-4096"), Apk("apksigner-sha256-2048"),
                         Apk("apksigner-sha1-4096")}),
@@ -234,7 +235,8 @@ TEST(Verdict, TellsWhatAProgramHasToKnowOfFileToolAndSigner) {
   const auto sha256 = [](const std::string& file) {
     return RunProcess({"sha256sum", file}).output.substr(0, 64);
   };
-  // Under an emulator, ToolPath() is a script, and its directory is beside that of the programs.
+  // Under an emulator, ToolPath() is a script. The programs are in the directory bin, beside the
+  // script's directory.
   std::filesystem::path tool = ToolPath();
   if (AreProgramsEmulated()) tool = tool.parent_path() / "../bin/apktoolkit";
   const std::string apk = Apk("changed-dex");

@@ -115,7 +115,8 @@ void ExpectRefusalAfter(const std::string& name, std::initializer_list<std::stri
 
 class BlockWithAttributes : public testing::TestWithParam<const char*> {};
 
-// The tool reads the element after the attributes as the signature, and refuses its padding.
+// The signature blocks contain signed attributes. The tool reads the element after these, the
+// signature algorithm, as the signature, and refuses its padding.
 TEST_P(BlockWithAttributes, IsRefused) {
   ASSERT_TRUE(Contains(BlockStructure(GetParam()), ":messageDigest"));
 

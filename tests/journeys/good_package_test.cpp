@@ -1,4 +1,5 @@
-// Packages that verify: what is signed and registered, with what, and in which order.
+// Packages that verify: the files that are signed, their payloads, the key that is registered, and
+// the order of these steps.
 #include <gtest/gtest.h>
 
 #include <filesystem>

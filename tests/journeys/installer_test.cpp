@@ -108,8 +108,8 @@ TEST(Entries, LibraryChangedInsideThePackageIsNotBlamedOnTheInstallation) {
   EXPECT_EQ(event["entries"]["differing"]["looked_at"], 1);
 }
 
-// The verifier reports this fault of the package, and does not give up. The length of an entry is
-// in its local header and in its central directory header.
+// The verifier reports the wrong length as an error of the package, and does not give up. The
+// length of an entry is in its local header and in its central directory header.
 TEST(Installer, RefusesAnEntryThatIsLongerThanItSays) {
   const TempDir directory;
   const ProcessResult made = RunProcess({"bash", "-e", "-c", R"(cp -r "$0"/* .
@@ -259,7 +259,7 @@ TEST(Installer, JournalHasTheWholeAnswer) {
   EXPECT_EQ(error["parameters"][0], "AndroidManifest.xml");
 }
 
-// An answer is one line of JSON for any names of entries.
+// The verifier's answer is one line of JSON, whatever the names of the entries are.
 TEST(Installer, OddNamesDoNotBreakTheAnswer) {
   const TempDir directory;
   const ProcessResult made = RunProcess({"python3", "-c", R"(
@@ -293,7 +293,7 @@ TEST(Installer, FileThatChangesBeforeItsAnswerHasNoResult) {
   EXPECT_EQ(told_with("ln '" + apk + "' '" + apk + ".link'").status, 0);
 }
 
-// The run finds no Java, but no message says so.
+// The run finds no Java. It prints no message about this, because it asks no installer about a JAR.
 TEST(Installer, IsNotAskedAboutAJar) {
   const TempDir directory;
   const ProcessResult made = RunProcess(

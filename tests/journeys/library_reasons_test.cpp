@@ -66,7 +66,7 @@ TEST_F(Reason, StrictRefusesALibraryThatNoInstallerTakes) {
   EXPECT_EQ(Told(1, {"--install"}).back(), "-> 0");
 }
 
-// The package alone, as a store delivers it.
+// The package without libraries beside it, as a store delivers it.
 TEST_F(Reason, LibrariesThatAreNotBesideThePackage) {
   Take("apksigner-sha256-2048");
   Do("rm -r lib");
@@ -87,7 +87,8 @@ TEST_F(Reason, LibrariesThatAreNotBesideThePackage) {
   EXPECT_EQ(Told(4, {"--install"})[2], "  ✓ lib/arm64/libvault.so  signed");
 }
 
-// Without an --install option, the libraries of a package that is alone are laid out as on a phone.
+// If a package has no libraries beside it, the simulator lays it out even without an --install
+// option: it extracts the libraries as a phone's installer does.
 TEST_F(Reason, PackageWithoutLibrariesBesideItIsLaidOut) {
   Take("apksigner-sha256-2048");
   Do("rm -r lib");

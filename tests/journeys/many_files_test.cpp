@@ -81,7 +81,7 @@ TEST_F(ManyFiles, DirectoryWithoutRecursiveIsRefusedWithTheCure) {
             std::string::npos);
 }
 
-// The tool looked at no file there, so the run must fail.
+// The tool looked at no file in the empty directory, so the run must fail.
 TEST_F(ManyFiles, DirectoryWithoutPackagesIsNoSuccess) {
   fs::create_directory(directory_ / "empty");
   ASSERT_EQ(Told(Do("sim --recursive good empty --journal journal")),
@@ -122,8 +122,8 @@ TEST_F(ManyFiles, ListThatNamesNothingIsNoSuccess) {
                    "directory\n"}));
 }
 
-// A package is laid out in a directory with another name each time, but no output contains this
-// name. Only the process ID and the date of the run differ.
+// Each run extracts the package's libraries into a new temporary directory. No output contains the
+// name of this directory, so only the process ID and the date of the run differ.
 TEST_F(ManyFiles, TwoRunsOverTheSameFileTellTheSame) {
   const std::string both =
       "for run in 1 2; do sim --journal $run.journal --html $run.html good/base.apk; "
@@ -147,8 +147,8 @@ TEST_F(ManyFiles, TwoRunsOverTheSameFileTellTheSame) {
   }
 }
 
-// A name with the placeholder in it is shown unchanged. It is not ambiguous, because a resolved
-// path begins with a slash.
+// A file name that contains the placeholder <install> is shown unchanged. The placeholder is not
+// ambiguous, because a resolved path begins with a slash.
 TEST_F(ManyFiles, NameThatLooksLikeAnInstallationIsTold) {
   const ProcessResult run =
       Do("mkdir '<install>'; cp good/base.apk '<install>'/; sim --journal journal "
@@ -159,7 +159,7 @@ TEST_F(ManyFiles, NameThatLooksLikeAnInstallationIsTold) {
             std::string::npos);
 }
 
-// The list is a file of the user.
+// The list is the user's file, so no output may replace it.
 TEST_F(ManyFiles, ListIsNotOverwritten) {
   const ProcessResult run =
       Do("echo good/base.apk >list; sim --files-from list --journal list; cat list");

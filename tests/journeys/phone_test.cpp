@@ -31,14 +31,15 @@ class GoodPackageOn : public testing::Test {
   const std::string library_ = directory_.Write("lib/arm64/libfoo.so", ToBytes("\177ELF foo"));
 };
 
-// The events of one refused signature. `kernels_part` has those of the kernel, before the message.
+// The events of one refused signature. `kernels_part` has the kernel's events, which come before
+// the tool's message.
 std::string Refusal(const std::string& kernels_part, int error) {
   return Timeline({Log(4, "VeltSignOat: Apk case.\n"), kernels_part,
                    Log(6, "VELT can't sign a file (result=10000, errno " + std::to_string(error) +
                               ": " + strerror(error) + ").\n")});
 }
 
-// The events of two refused signatures. `library_part` and `package_part` have those of the kernel.
+// The events of two refused signatures. `library_part` and `package_part` have the kernel's events.
 std::string BothRefused(const std::string& library_part, const std::string& package_part,
                         int error) {
   return Timeline({LibraryStep({Refusal(library_part, error)}),
@@ -75,8 +76,8 @@ TEST_F(GoodPackageOn, APhoneWithoutIntegrityFilesIsNotSigned) {
   EXPECT_EQ(run.status, 1);
 }
 
-// The timeline without the values of errno. If no system call refused, errno has the value that
-// some earlier call left.
+// The timeline without the values of errno. If no system call failed, errno has the value that some
+// earlier call left.
 std::string WithoutErrno(const std::string& timeline) {
   return std::regex_replace(timeline, std::regex("errno [0-9]+: [^)]*"), "errno");
 }

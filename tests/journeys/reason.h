@@ -1,4 +1,4 @@
-// Looks at a package with the simulator, and returns the first lines of its answer.
+// Runs the simulator on a package, and returns the first lines of the simulator's output.
 #pragma once
 
 #include <gtest/gtest.h>
@@ -22,9 +22,9 @@ inline std::string ByRsa2048() {
 
 inline constexpr size_t kAll = 1000;
 
-// The first `lines` lines of `all`, and the status. If something was refused, the line of the
-// verdict repeats the reason of the first line with a cross. This function checks the repeated
-// reason, and removes it.
+// Returns the first `lines` lines of `all`, and its last line, the status. If something was
+// refused, the first line, the verdict, repeats the reason of the first line that has a cross (✗).
+// This function checks the repeated reason, and removes it.
 inline Lines WithoutReason(size_t lines, Lines all) {
   const auto is_cross = [](const std::string& line) { return line.rfind("  ✗ ", 0) == 0; };
   const auto cross = std::find_if(all.begin(), all.end(), is_cross);
@@ -51,7 +51,8 @@ inline Lines WithoutReason(size_t lines, Lines all) {
 // A copy of a golden package with its libraries beside it. Each test damages its copy.
 class Reason : public testing::Test {
  protected:
-  // `name` is a directory or a package that make_golden_packages made.
+  // Copies `name`, a directory or a package that make_golden_packages made, into the test's
+  // directory.
   void Take(const std::string& name) {
     const std::filesystem::path source = std::filesystem::path(GOLDEN_PACKAGES) / name;
     if (std::filesystem::is_directory(source)) {

@@ -91,7 +91,7 @@ TEST_F(Reason, DsaKey) {
                    "-> 1"}));
 }
 
-// The cure also states its cost.
+// The text of the cure also states its disadvantage: the package gets another signer.
 TEST_F(Reason, AnotherKeyIsAnotherSignerAndRotationDoesNotHelp) {
   for (const char* name : {"apksigner-ec", "apksigner-5120"}) {
     Do("rm -rf -- *");
@@ -106,8 +106,8 @@ TEST_F(Reason, AnotherKeyIsAnotherSignerAndRotationDoesNotHelp) {
   }
 }
 
-// By default, every version of keytool signs the certificate of a key of this size with SHA-384.
-// The package keytool-sha256 shows that the cure helps.
+// By default, every version of keytool signs the certificate of an RSA key of 3584 bits with
+// SHA-384. The package keytool-sha256 shows that the cure helps.
 TEST_F(Reason, CertificateSignedWithALongerDigest) {
   Take("keytool-sha384");
   const Lines told = Told(5);
@@ -129,7 +129,8 @@ TEST_F(Reason, SignatureOverALongerDigest) {
             "MD5, SHA-1 and SHA-256");
 }
 
-// No tool makes such a block. The test writes it for another owner's key, without the private key.
+// No tool makes a signature block whose key has the public exponent 1. The test writes such a block
+// for another owner's key, without the private key.
 TEST_F(Reason, ExponentOfOne) {
   Take("apksigner-sha256-2048");
   Do("unzip -q base.apk META-INF/CERT.SF");
@@ -181,7 +182,7 @@ TEST_F(Reason, TextFile) {
 
 TEST_F(Reason, DamagedArchive) {
   Take("apksigner-sha256-2048");
-  // This changes the directory's offset in the end record.
+  // This changes the central directory's offset in the end-of-central-directory record.
   Do("printf '\\xff' | dd of=base.apk bs=1 conv=notrunc status=none "
      "seek=$(($(stat -c %s base.apk) - 3))");
   EXPECT_EQ(Told(2)[1],

@@ -15,7 +15,8 @@ namespace {
 
 const Bytes kLibrary = ToBytes("\177ELF foo");
 
-// A package that asks for the permission, and its library on disk. Each test changes one of them.
+// A package that requests the secure-storage permission, and its library on disk. Each test changes
+// the package or the library.
 class RefusedPackage : public testing::Test {
  protected:
   explicit RefusedPackage(const PackageOptions& options = Options())
@@ -32,8 +33,8 @@ class RefusedPackage : public testing::Test {
     return Simulate(apk_);
   }
 
-  // The package is refused before anything else happens. The tool logs these records and signs
-  // nothing.
+  // The tool refuses the package before it does anything else. It logs the records `reasons` and
+  // signs nothing.
   void ExpectRefusalAfter(std::initializer_list<std::string> reasons) const {
     const Simulation run = Run();
     EXPECT_EQ(run.timeline, Timeline({Timeline(reasons), NothingSigned(apk_), Exit(0)}));
@@ -173,6 +174,8 @@ TEST_F(TamperedPackage, CertificateOfAnotherIssuerIsRefused) {
   package_ = MakePackage([] {
     PackageOptions options = Options();
     // The issuer has the smaller modulus, so its signature is a number below the subject's modulus.
+    // The tool therefore refuses the padding and logs 7. For a larger number it would log another
+    // code.
     options.block.key = "rsa-2048-other";
     options.block.issuer_key = "rsa-2048";
     return options;

@@ -107,7 +107,7 @@ TEST(Doubtful, SeveralSigners) {
 }
 
 // Newer phones use the package's new key, and this tool uses the old one. apksigner writes the new
-// key into the newest scheme that it knows: v3, or v3.1 from version 32 on.
+// key into the newest scheme that it knows: v3, or v3.1 from version 32 of apksigner on.
 TEST(Doubtful, KeyThatWasRotated) {
   const std::string told = Told("rotated-key");
   const std::string schemes = LineWith(told, "schemes: ");

@@ -1,6 +1,6 @@
 // Packages that other programs read differently than the tool, for example with another signer.
 // Wherever the simulator names a key, it is the key that the kernel got. The line of the verdict
-// contains the alarms.
+// also contains the alarms, which are the most serious warnings.
 #include <gmpxx.h>
 #include <gtest/gtest.h>
 #include <openssl/mem.h>
@@ -21,7 +21,8 @@ namespace {
 
 using nlohmann::json;
 
-// The SHA-256 digest of the victim's modulus. The victim's key is rsa-2048.
+// The SHA-256 digest of the victim's modulus. The victim is the owner of the key rsa-2048, which
+// some of these packages show to other programs.
 std::string VictimsDigest() { return Hex(DigestOf(Digest::kSha256, ModulusOf("rsa-2048"))); }
 
 // A key with the public exponent 65537, and how to sign with it.
@@ -56,10 +57,11 @@ Package SignedAgain(Package package, Certificate certificate, const OwnKey& key)
   return package;
 }
 
-// The certificate shows the victim's modulus. An exponent of eight bytes makes the tool read 300
-// bytes, from the start of this modulus, as the modulus of its key. The last of these bytes belong
-// to an extension, and are chosen so that the number is a prime. The author of the package can sign
-// for a prime modulus. Sets `*digest` to the SHA-256 digest of this prime.
+// Returns a package whose certificate shows the victim's modulus. An exponent of eight bytes makes
+// the tool read 300 bytes, from the start of this modulus, as the modulus of the signer's key. The
+// last of these bytes belong to an extension, and are chosen so that the number is a prime. Anyone
+// can compute the private exponent for a prime modulus, so the author of the package can sign. Sets
+// `*digest` to the SHA-256 digest of this prime.
 Package WithAPrimeBehindTheVictimsModulus(std::string* digest) {
   constexpr size_t kSize = 300;
   Certificate certificate;
@@ -96,8 +98,8 @@ Package WithAPrimeBehindTheVictimsModulus(std::string* digest) {
   return SignedAgain(MakePackage(), certificate, key);
 }
 
-// Two zero bytes are before the modulus. One of them stays in the tool's key, and in the key's
-// digest, which is set in `*digest`.
+// Returns a package whose certificate has two zero bytes before the modulus. The tool keeps one of
+// these bytes in the modulus that it reads. Sets `*digest` to the SHA-256 digest of this modulus.
 Package WithAZeroBeforeTheModulus(std::string* digest) {
   const RSA* const rsa = TestRsaKey("rsa-2048");
   const auto number = [](const BIGNUM* from) {
@@ -221,7 +223,7 @@ TEST(TwoFaces, BlockThatNoStrictReaderReadsIsAmbiguous) {
   const Bytes certificate = SignatureBlock().SignerCertificate().Build();
   const auto at = std::search(block.begin(), block.end(), certificate.begin(), certificate.end());
   ASSERT_NE(at, block.end());
-  // This is the identifier octet of the certificates, which the tool ignores.
+  // The tool ignores this byte, the identifier octet of the certificates.
   at[-4] = 0xa3;
   const Told told(package);
   EXPECT_EQ(told.status, 0);
@@ -255,7 +257,7 @@ TEST(TwoFaces, PackageNameOfAnotherNamespaceIsToldBesideTheInstallers) {
   EXPECT_EQ(told.Warnings(), Codes({"other-package-name"}));
 }
 
-// ---- The newer signatures: the values that the platform reads count.
+// ---- The newer signatures (v2 and later): only the values that the platform reads count.
 
 TEST(TwoFaces, SecondValueOfASchemeIsNobodys) {
   const Bytes own = Signers({SignerBytes(SignatureBlock().SignerCertificate().Build())});

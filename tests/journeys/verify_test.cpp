@@ -208,7 +208,7 @@ TEST(VerifyOutput, ThatCannotBeWrittenIsAFailure) {
   }
 }
 
-// ---- The simulator's part.
+// ---- The simulator's option --verify.
 
 TEST(SimulatorVerify, DoesNotGoWithWhatTellsOfSigning) {
   for (const char* option : {"--install", "--strict", "--quiet", "--verbose", "--html=page"}) {

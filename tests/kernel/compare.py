@@ -3,11 +3,12 @@
 in the simulated phone, and prints a table.
 
 FILES has the files of the runs, EXPECTED the simulator's journals. Each directory KERNEL has
-`results`, as tests/kernel/init left them, and `disk.img`. Fails if anything differs: an event (log
+`results`, which tests/kernel/init wrote, and `disk.img`. Fails if anything differs: an event (log
 record, reading of the integrity value, call to the kernel with payload, result and errno,
 registration, exit status), its place in the order, a line of output, or a result of the probe. Also
-fails if a signed file on the disk does not keep its payload and its digest, if the tool's domain was
-not entered once per confined run, or if the kernel complained.
+fails if a signed file on the disk does not keep its payload and its digest, or if the kernel
+complained. With an SELinux policy, also fails if the tool's domain was not entered once per run that
+the policy confines.
 """
 
 import difflib
@@ -31,7 +32,7 @@ OF_SIMULATION = {"journal", "start", "attached", "verdict", "stdout"}
 SEEN_BY_MODULE = {"integrity", "sign", "verify"}
 INFORMATION = 4  # the workstation's liblog drops records of a lower priority
 COMPLAINT = re.compile(r"BUG:|WARNING:|Oops|Call [Tt]race|refcount_t|general protection|avc: +denied")
-# A kernel with a policy prints this when the installer's domain starts a program of the tool.
+# A kernel with an SELinux policy prints this when the installer's domain starts a program of the tool.
 ENTRY = re.compile(r"avc: +granted +{ transition } .* scontext=u:r:installd:s0 tcontext=u:r:apktoolkit:s0 ")
 
 
@@ -50,7 +51,7 @@ class Kernel:
         self.verdicts = {}  # "same" or "DIFFERS", by the name of the run
 
     def events(self, run):
-        """All events without the output, with the log's records in their places."""
+        """All events of a run except its output, in order. Log records are events too."""
         events = []
         for line in (self.results / f"{run.name}.journal").read_text().split("\n")[:-1]:
             record = RECORD.fullmatch(line)
@@ -71,7 +72,7 @@ class Kernel:
 
 
 def simulated(expected, run):
-    """The simulated phone's events that a run on a real kernel shows as well, and the output."""
+    """The events of a simulated run that a run on a real kernel also has, and the run's output."""
     lines = (expected / f"{run.name}.journal").read_text().splitlines()
     events = [json.loads(line) for line in lines]
     output = "".join(event["text"] for event in events if event["event"] == "stdout")
@@ -132,12 +133,12 @@ def check_disk(kernel, files, all_runs):
             if not kept.exists() or kept.read_bytes()[32:] != payload:
                 kernel.problems.append(f"{path} does not keep its payload on the disk")
             elif (kept.read_bytes()[:32] == digest) == is_changed:
-                kernel.problems.append(f"{path} keeps the digest of other bytes")
+                kernel.problems.append(f"{path} does not keep the digest of the bytes that were signed")
     return len(payloads)
 
 
 def check_domain(kernel, all_runs):
-    """With a policy, checks that the tool's domain was entered once per confined run."""
+    """With an SELinux policy, checks that the tool's domain was entered once per confined run."""
     entered = sum(bool(ENTRY.search(line)) for line in kernel.messages)
     confined = sum(run.confined for run in all_runs)
     if kernel.has_policy and entered != confined:
@@ -145,7 +146,7 @@ def check_domain(kernel, all_runs):
 
 
 def summary(expected, run):
-    """A short text of the run's events."""
+    """The number of each answer of the kernel and of libzu, such as "3 signed, 1 registered"."""
     events, _ = simulated(expected, run)
     answers = {}
     for event in events:

@@ -2,8 +2,9 @@
 """The runs on the real kernel and in the simulated phone, for scripts/kernel.
 
 runs.py files DIRECTORY GOLDEN           makes the files for the runs
-runs.py simulate DIRECTORY BUILD OUT     simulates all runs, with the journals OUT/NAME.journal.
-                                         Writes the same runs as a script for the guest: OUT/runs
+runs.py simulate DIRECTORY BUILD OUT     simulates all runs and writes the journals OUT/NAME.journal.
+                                         Also writes OUT/runs, a script that makes the same runs under
+                                         qemu
 """
 
 import errno
@@ -34,7 +35,7 @@ PROBES = {
               # descriptors that are not open, or that only name a file (O_PATH)
               "sign 700 0000", "sign -1 0000", "sign 700 null", "verify 700", "verify -1",
               "name .", "sign 5 0000", "verify 5",
-              # other commands than the feature's own
+              # commands that are not those of the feature
               "fcntl 3 1123 0", "fcntl 3 1126 0", "fcntl64 3 99999 0", "fcntl 700 1126 0", "fcntl 3 1 0",
               # the integrity files, which can only be read
               "fopen /proc/self/integrity/value r", "fopen64 /proc/self/integrity/value r",
@@ -47,10 +48,10 @@ PROBES = {
 class Run:
     """A run of a program for one file, on a phone that these options of apktoolkit-sim describe.
 
-    before: a shell command that first changes the files, on the phone and in the simulation.
-    feature: True if the kernel has the feature. mount: how the files are mounted.
-    confined: True if the run is in the tool's domain on a kernel with a policy. The policy is for
-    regular files. It has no rules for the probe, which no product contains.
+    before: a shell command that changes the files before the run, under qemu and in the simulation.
+    feature: True if the kernel has the file-integrity feature. mount: how the files are mounted.
+    confined: True if the run is in the tool's SELinux domain on a kernel with a policy. The policy
+    has rules only for regular files. It has no rules for the probe, which no product contains.
     """
 
     def __init__(self, name, file, *options, program=TOOL, before=None, feature=True, mount="rw",

@@ -1,5 +1,5 @@
-// Tests each reason with a package that is refused for it, the lines in the log, and the release of
-// the archive.
+// Tests each reason with a package that is refused for it. Also tests the lines in the log and the
+// release of the archive.
 #include "library/verification.h"
 
 #include <fcntl.h>
@@ -93,7 +93,8 @@ TEST(VerificationReason, SaysWhatTheFileIs) {
   EXPECT_EQ(ReasonOf(WithUnreadable(kAndroidManifestName)), Reason::kAndroidManifestUnreadable);
 }
 
-// An entry whose name only begins with the manifest's name is not the manifest.
+// An entry whose name only begins with AndroidManifest.xml or META-INF/MANIFEST.MF is neither of
+// these manifests.
 TEST(VerificationReason, GoesByTheWholeNameOfAnEntry) {
   PackageOptions options = PlainJar();
   options.entries.push_back({"AndroidManifest.xml.bak", ToBytes("x")});

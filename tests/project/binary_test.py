@@ -11,7 +11,8 @@ import tempfile
 
 from sources import ROOT, report
 
-# A program with a use for each part: a buffer on the stack, and a call with a buffer of known size.
+# A program that needs the hardening: it has a buffer on the stack, and a call with a buffer of
+# known size.
 SOURCE = """#include <stdio.h>
 #include <string.h>
 int main(int count, char** words) {
@@ -22,6 +23,8 @@ int main(int count, char** words) {
 }
 """
 
+# The flags of a hardened program, by part of the hardening. A row of BAD replaces the flags of one
+# part.
 GOOD = {"bind": "-Wl,-z,now", "table": "-Wl,-z,relro", "place": "-pie -fPIE",
         "stack": "-fstack-protector-strong", "calls": "-D_FORTIFY_SOURCE=2", "heap": "-O2"}
 

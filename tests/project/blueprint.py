@@ -11,7 +11,7 @@ from sources import ROOT, without_comments
 
 TOKEN = re.compile(r'"((?:[^"\\]|\\.)*)"|([A-Za-z_]\w*|\d+)|([{}\[\]:,=+])|(\S)')
 
-# The language level of Android 8.1 for a module that names none.
+# The C++ standard of Android 8.1 for a module without cpp_std.
 DEFAULT_STANDARD = "gnu++14"
 
 
@@ -93,8 +93,8 @@ class Tree:
                 *(f"-I{directory}" for directory in directories)]
 
     def with_defaults(self, module):
-        """The module with the properties of its defaults. The defaults' lists come before its
-        own."""
+        """The module with the properties of the modules in its "defaults". Their lists come before
+        the module's own lists."""
         merged = {}
         for part in [*map(self.with_defaults, self.named(module.get("defaults", []))), module]:
             for key, value in part.items():

@@ -39,8 +39,8 @@ KNOWN_PROPERTIES = {"cflags", "compile_multilib", "cpp_std", "data", "defaults",
                     "export_include_dirs", "init_rc", "ldflags", "local_include_dirs", "name", "shared_libs",
                     "srcs", "static_libs"}
 
-# The first flag is for headers that are system headers in CMake's build but not in the platform's.
-# In CMake's build, the developers' presets set the second flag by a variable of CMake.
+# -Wno-sign-conversion is for headers that are system headers in CMake's build but not in the
+# platform's. In CMake's build, a variable in the presets takes the place of -Werror.
 PLATFORM_ONLY_FLAGS = {"-Wno-sign-conversion", "-Werror"}
 
 
@@ -71,7 +71,8 @@ def main():
     compare("CMakeLists.txt and the tool's directories", map(str, tool_sources()),
             sum(map(cmake_sources, ("apktoolkit_core", "apktoolkit", "apktoolkit-verify", "zu")), []), problems)
     there = {str(path.relative_to(ROOT)) for path in ROOT.glob("fuzz/*_fuzz.cpp")}
-    compare("the files, and WORKSTATION_ONLY with fuzz/cc_fuzz.bp", {*WORKSTATION_ONLY, *fuzz.all_sources("cc_fuzz")},
+    compare("the sources on disk, and those in WORKSTATION_ONLY and fuzz/cc_fuzz.bp",
+            {*WORKSTATION_ONLY, *fuzz.all_sources("cc_fuzz")},
             {"fuzz/quiet_log.cpp", *there, *(path for path in WORKSTATION_ONLY if (ROOT / path).exists())}, problems)
     hold_flags(platform, problems)
     hold_wraps(tests, problems)
@@ -101,7 +102,8 @@ def hold_flags(platform, problems):
     lists = re.findall(r"(?:add_compile_options|set)\((?:APKTOOLKIT_TOOL_OPTIONS )?(-[^)]*)\)", settings)
     warnings = {flag for text in lists for flag in text.split() if flag.startswith("-W")}
     flags = set(platform.module("apktoolkit_defaults")["cflags"])
-    compare("warnings", flags ^ PLATFORM_ONLY_FLAGS, warnings, problems)
+    compare("the warnings in Android.bp and in cmake/CompilerSettings.cmake",
+            flags ^ PLATFORM_ONLY_FLAGS, warnings, problems)
     presets = json.loads((ROOT / "CMakePresets.json").read_text())["configurePresets"]
     base = next(preset for preset in presets if preset["name"] == "base")
     if base["cacheVariables"].get("CMAKE_COMPILE_WARNING_AS_ERROR") != "ON":
@@ -116,8 +118,8 @@ def hold_wraps(tests, problems):
     for module in (module for module in tests.modules if module["type"] == "cc_test"):
         name = module["name"]
         target = "phone" if name in MORE else name.replace("apktoolkit_", "")
-        compare(f"functions wrapped for {name}", re.findall(r"--wrap=(\w+)", str(module.get("ldflags"))),
-                wrapped.get(target, []), problems)
+        compare(f"the functions wrapped for {name} in tests/Android.bp and in CMake's build",
+                re.findall(r"--wrap=(\w+)", str(module.get("ldflags"))), wrapped.get(target, []), problems)
 
 
 def hold_words(platform, tests, problems):
@@ -128,7 +130,7 @@ def hold_words(platform, tests, problems):
         if module.get("cpp_std", "c++1z") != "c++1z":
             problems.append(f"{module['name']}: Android 8.1 does not know {module['cpp_std']}")
     # Android 8.1 reads only the named blueprints. Later releases read all that they find.
-    compare("the blueprints below Android.bp", platform.variables["subdirs"],
+    compare("subdirs in Android.bp, and the directories with an Android.bp", platform.variables["subdirs"],
             [path.parent.name for path in ROOT.glob("*/Android.bp")], problems)
 
 
@@ -149,7 +151,7 @@ def without_comments_of_cmake(path):
 
 def compare(name, left, right, problems):
     for item in sorted(set(left) ^ set(right)):
-        problems.append(f"{name}: {item} is on one side only")
+        problems.append(f"{name}: only one of the two has {item}")
 
 
 if __name__ == "__main__":

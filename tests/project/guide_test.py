@@ -19,8 +19,8 @@ PAGE = ROOT / "docs/guide.md"
 DIRECTORY = "/data/app/vault"  # replaces the path of this test's directory on the page
 BLOCK = re.compile(r"^```\n(\$ .*?)\n```$", re.M | re.S)
 
-# Texts that differ with each new certificate, and with each compiler of the library. The page may
-# have any value for them.
+# Texts that change with each new certificate, or with the compiler that built libvault.so. The page
+# may have any value for them.
 VARIES = [(re.compile(r"certificate SHA-256 digest: [0-9a-f]{64}"), "certificate SHA-256 digest: *"),
           (re.compile(r"\(\d+ bytes\) verified"), "(* bytes) verified"),
           (re.compile(r"(signer CN=Example, RSA-2048, key ).*"), r"\1*")]

@@ -1,8 +1,8 @@
 #!/usr/bin/env python3
-"""Checks journals of real runs with docs/journal.schema.json.
+"""Checks that journals of real runs follow docs/journal.schema.json.
 
-Arguments: the directory of a good package that asks for its key to be registered, and the words
-that start apktoolkit-sim.
+Arguments: the directory of a good package that asks for its key to be registered, and the command
+line that starts apktoolkit-sim.
 """
 
 import json

@@ -12,6 +12,7 @@ from sources import ROOT, report
 
 PAGES = ("README.md", "docs/guide.md", "man/apktoolkit.1")
 COMMAND = re.compile(r"keytool -genkeypair (?:.*\\\n)*.*")
+# The default signature algorithm of each JDK, by the key's length in bits.
 OWN_CHOICE = {17: {"3072": "sha256WithRSAEncryption", "3073": "sha384WithRSAEncryption"},
               21: {"2048": "sha384WithRSAEncryption"}}
 

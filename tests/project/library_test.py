@@ -19,8 +19,8 @@ MARK = "== next command"
 
 
 def prepare(directory, build, package):
-    """Fills the page's directory with the examples, the build tree, and the files that the page
-    names."""
+    """Fills the directory in which the page's commands run: with the examples, the build tree, and
+    the packages that the page names."""
     shutil.copytree(ROOT / "examples", directory / "examples")
     (directory / "build").mkdir()
     (directory / "build/release").symlink_to(build)

@@ -1,7 +1,7 @@
 #!/usr/bin/env python3
 """Writes parts of docs/messages.md from the sources: the priority and files of each message of the
-tool, and the tables of the simulator's reasons. The codes in docs/journal.schema.json come from the
-same rows.
+tool, and the tables of the simulator's reasons. Also writes the codes of the reasons to
+docs/journal.schema.json.
 
 The explanation of each message is written by hand. The test fails if a message has no entry, if an
 entry has no message, or if the simulator looks for a text that the tool does not log.
@@ -64,8 +64,8 @@ GROUPS = {"kNotLookedAt": "The tool did not look at the file",
           "kInstaller": "The installer of the phones",
           "kGate": "The gate: what the command line demands", "kWarning": "Warnings"}
 
-# Groups whose causes need not break the chain from the key to the entries. reasons_problems() has
-# the other exceptions.
+# Groups with causes that need not name a link of the chain (ChainLink). reasons_problems() has the
+# other exceptions.
 UNBROKEN = {"kKernel", "kKey", "kInstaller", "kGate", "kWarning"}
 
 PAGE = ROOT / "docs/messages.md"
@@ -111,7 +111,7 @@ def reasons_problems(rows, messages):
         if row["group"] not in GROUPS:
             problems.append(f"{name}: the group has no title")
         if f"&cause::{name}" not in chosen:
-            problems.append(f"{name} is chosen nowhere")
+            problems.append(f"{name}: no source of the simulator chooses this cause")
         is_absent = row["severity"] in ("kAbsent", "kNothing", "kFollows")
         may_hold = row["group"] in UNBROKEN or row["group"] == "kLibrary" or is_absent
         if row["link"] == "kNone" and not may_hold and row["group"] != "kTool":

@@ -9,7 +9,7 @@ from sources import ROOT, report, without_comments
 
 DOCS = [*sorted(ROOT.glob("*.md")), *sorted((ROOT / "docs").rglob("*.md"))]
 
-# `Suite.Test`, `Suite.*`, or either with the prefix of a suite that is instantiated.
+# `Suite.Test` or `Suite.*`. An instantiated suite also has a prefix: `Prefix/Suite.Test`.
 NAMED = re.compile(r"`((?:\w+/)?[A-Z]\w+)\.(\*|[A-Z]\w+)`")
 DEFINED = re.compile(r"^TEST(?:_F|_P)?\(\s*(\w+),\s*(\w+)\)", re.M)
 INSTANTIATED = re.compile(r"INSTANTIATE_TEST_SUITE_P\(\s*(\w+),\s*(\w+),")
@@ -18,8 +18,8 @@ LINK = re.compile(r"\]\(([^)#:]+)(?:#[^)]*)?\)")
 
 PAGE = ROOT / "docs/architecture.md"
 PATH = r"\w[\w/]*/\w+\.(?:cpp|h|md|py)"
-# The page names a function and its file in three places: a step of the picture, a row of the table,
-# and an answer.
+# The page names a function and its file in the steps of its picture, in the rows of its table, and
+# in its answers to questions.
 STOP = re.compile(rf"^[ |:v]*([\w:]+) +({PATH})", re.M)
 ROW = re.compile(rf"^\|[^|]*\| ([^|]*) \| ((?:`{PATH}`(?:, )?)+) \|$", re.M)
 ANSWER = re.compile(rf"`([\w:]+)`\s+in\s+`({PATH})`")

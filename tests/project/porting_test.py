@@ -21,7 +21,7 @@ def section(title):
     return re.search(rf"^#+ {re.escape(title)}\n(.*?)(?=^#)", PAGE, re.M | re.S)[1]
 
 
-# A fact in the sources, and the text in which the page states it.
+# A source, the pattern of a value in it, and the page's text with "{}" for the value.
 INTERFACE = (
     ("sign/integrity.cpp", r"kSignCommand = (\d+);", "### fcntl(fd, {}, payload): sign\n"),
     ("sign/integrity.cpp", r"kVerifyCommand = (\d+);", "### fcntl(fd, {}): verify\n"),

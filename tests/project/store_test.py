@@ -43,7 +43,7 @@ def commands():
 
 
 def prepare(golden, directory):
-    """Makes the store. Returns the number of packages of each verdict."""
+    """Makes the store, a tree of packages. Returns the number of packages of each verdict."""
     number = 0
     for source, _, count in PACKAGES:
         for _ in range(count):
@@ -58,7 +58,7 @@ def prepare(golden, directory):
 
 
 class Store(Shell):
-    """A shell whose commands can be killed. They write their journals to its directory."""
+    """A shell whose commands can be killed. Their journals are in the shell's directory."""
 
     def __init__(self, directory, simulator):
         super().__init__(directory, simulator)
@@ -79,7 +79,7 @@ class Store(Shell):
         return output, problems
 
     def journals(self):
-        """The names of the lists that are done."""
+        """The names of the finished lists. A list's journal gets the list's name when it is whole."""
         return sorted(path.name for path in (self.directory / "journals").glob("??????"))
 
 

@@ -1,7 +1,7 @@
 #!/usr/bin/env python3
-"""Compiles integration/sepolicy with stand-ins for the platform's policy, for every supported kind
-of release. The policy must grant exactly the permissions that are listed below, and file_contexts
-must be valid and match each program of the kit once.
+"""Compiles integration/sepolicy with stand-ins for the platform's policy, for each API level in
+LEVELS. The policy must grant exactly the permissions that are listed below. file_contexts must be
+valid, and exactly one of its patterns must match each program of the kit.
 
 m4, checkpolicy, secilc and setfiles are Debian's. The compilation must fail with each rule of
 REFUSED.
@@ -146,7 +146,7 @@ def check(directory, level):
             continue
         problems += difference(name, grants(cil), wanted(listed, unknown))
         if ("typeattributeset system_file_type" in cil) == ("system_file_type" in unknown):
-            problems.append(f"{name}: system_file_type must be used exactly at the levels that know it")
+            problems.append(f"{name}: system_file_type must be used if and only if the level knows it")
         labels = run("setfiles", "-c", directory / "policy", KIT / "file_contexts")
         if labels.returncode != 0:
             problems.append(f"{name}: file_contexts: {labels.stdout}")

@@ -34,7 +34,8 @@ class ChangedLibrary : public testing::Test {
   void SetUp() override { alarm(60); }  // ends a test that waits for a FIFO
   void TearDown() override { alarm(0); }
 
-  // Expects that the library is signed after this number of digests, and that no refusal is logged.
+  // Expects that the library is signed after its digest was computed `digests` times, and that no
+  // refusal is logged.
   void ExpectSigned(int digests) {
     EXPECT_EQ(file_.SignJni(), 0U);
     EXPECT_EQ(signed_, std::vector<Bytes>({kGood.data}));
@@ -65,7 +66,7 @@ class ChangedLibrary : public testing::Test {
     unlink(target_.c_str());
     EXPECT_EQ(symlink(file_.Path(name).c_str(), target_.c_str()), 0);
   }
-  // Writes other bytes, of the same number, into the file itself.
+  // Overwrites the file in place with as many other bytes.
   void WriteInPlace() const {
     UntilNoticed([this] {
       FILE* const file = fopen(target_.c_str(), "r+");
@@ -204,8 +205,8 @@ TEST_F(ChangedLibrary, ExchangedBeforeTheKernelSignsIsSignedAsItWasRead) {
   ExpectSigned(1);
 }
 
-// After the opening, the path again leads to the file that was read, and the file's state is
-// unchanged. Only the descriptor shows the exchange.
+// After the second opening, the path again leads to the file that was read, and the state of that
+// file is unchanged. Only the descriptor shows the exchange.
 TEST_F(ChangedLibrary, ExchangedForTheMomentOfItsOpeningIsRefused) {
   Link("good");
   before_second_open_ = [this] { Link("evil"); };
@@ -289,7 +290,7 @@ TEST_F(ChangedLibrary, ThatIsLeasedAtItsSecondOpeningIsSigned) {
     return path == target_ && ++asked == 2 ? EWOULDBLOCK : 0;
   };
   ExpectSigned(1);
-  EXPECT_EQ(asked, 3);  // the third pins the file (O_PATH); its link in /proc is not counted
+  EXPECT_EQ(asked, 3);  // the third open has O_PATH; the fourth has a path in /proc
 }
 
 // Before the tool opens the file again, the holder of the lease could put another file in its

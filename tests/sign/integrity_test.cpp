@@ -1,4 +1,5 @@
-// The kernel interface: the calls to the kernel, the cases without a call, and the waiting.
+// Tests the interface to the kernel: which calls are made, when no call is made, and how long the
+// tool waits.
 #include "sign/integrity.h"
 
 #include <gtest/gtest.h>
@@ -87,7 +88,8 @@ TEST(VeltSignFd, WaitsInSteps10MillisecondsLongUntilTheValueSettles) {
             Events({kSelf, "sleep 10000", kSelf, "sleep 10000", kSelf, "sign 7 0300aabbcc"}));
 }
 
-// The value settles after a hundred seconds. The Phone does not really sleep.
+// The value settles after 10000 steps of 10 ms, which are 100 seconds. The Phone does not really
+// sleep.
 TEST(VeltSignFd, WaitsHoweverLongTheValueTakes) {
   constexpr size_t kSteps = 10000;
   Phone phone;

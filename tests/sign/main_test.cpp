@@ -1,5 +1,6 @@
-// Tests what main() does apart from the three steps. The tool runs without the simulated phone. The
-// tool's log goes to standard error.
+// Tests what main() does apart from its three steps, which sign the libraries, sign the file and
+// register the key. The tool runs without the simulated phone. The tool's log goes to standard
+// error.
 #include <gtest/gtest.h>
 #include <sys/stat.h>
 
@@ -27,7 +28,7 @@ TEST(Main, WithStandardInputTheFileIsWorkedOn) {
   EXPECT_TRUE(Says(run, "VeltSignJni starts: 3.")) << run.errors;
 }
 
-// The file then gets descriptor 0, which main() refuses.
+// Without standard input, the file gets descriptor 0, which main() refuses.
 TEST(Main, WithoutStandardInputTheFileIsLeftAlone) {
   const DiskFile file(MakePackage().Build());
   const ProcessResult run = RunTool("\"$0\" \"$1\" <&-", file.path());

@@ -1,4 +1,5 @@
-// A package on disk with its libraries beside it, on a phone inside the test program.
+// A package on disk with its libraries beside it. Inside the test program, a Phone
+// (support/phone.h) takes the place of the kernel and of libzu.
 #pragma once
 
 #include <fcntl.h>
@@ -40,7 +41,8 @@ inline LogRecord Starts(int fd) {
 }
 inline LogRecord Finished() { return Info("VeltSignJni finished: 0.\n"); }
 
-// A package in its own directory, opened as main opens it, with the log and the phone ready.
+// A package in its own directory, opened as main() opens it. `log` has only the messages after the
+// opening.
 class PackageOnPhone {
  public:
   explicit PackageOnPhone(const Package& package, const std::string& directory = "")

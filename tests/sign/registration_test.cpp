@@ -16,7 +16,8 @@ namespace {
 
 using Events = std::vector<std::string>;
 
-// An archive in memory, opened as main opens it, with the log and the phone ready.
+// An archive in memory, opened as main() opens it. `log` has only the messages after the opening,
+// and `phone` takes the place of libzu.
 struct ArchiveOnPhone {
   explicit ArchiveOnPhone(const Package& package) : open(package), apk(open.apk) { log.Clear(); }
   int fd() const { return open.file.fd(); }
@@ -37,8 +38,8 @@ std::string RegisterPackage(int fd) {
   return "register " + std::to_string(fd) + " com.example.app " + Hex(ModulusOf("rsa-2048"));
 }
 
-// The event with four SHA-256 digests by libcrypto. The first is the digest of the path. Each later
-// digest is the digest of the previous digest.
+// The event that registers a JAR. Its data are four SHA-256 digests, computed by libcrypto. The
+// first is the digest of the path. Each later digest is the digest of the previous digest.
 std::string RegisterJar(int fd, const std::string& path) {
   uint8_t block[4 * SHA256_DIGEST_LENGTH];
   SHA256(reinterpret_cast<const uint8_t*>(path.data()), path.size(), block);
@@ -89,7 +90,8 @@ TEST(ZuSign, TheRegistrationIsMadeForTheSecondDescriptor) {
 }
 
 TEST(ZuSign, APackageWithThePermissionThatTurnedBadIsNotRegistered) {
-  // The permission is read only if META-INF/MANIFEST.MF verified, so only the dex file is bad.
+  // The permission is read only if META-INF/MANIFEST.MF verified. In this package, therefore, only
+  // the dex file is bad.
   Package package = SecureStoragePackage();
   package.Tamper("classes.dex");
   ArchiveOnPhone file(package);

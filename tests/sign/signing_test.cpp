@@ -157,7 +157,7 @@ TEST(VeltSignJni, TheDescriptorOfALibraryIsClosed) {
   EXPECT_EQ(fcntl(file.fd() + 1, F_GETFD), -1);
 }
 
-// The process was started without standard input.
+// This happens if the process was started without standard input.
 TEST(VeltSignJni, ALibraryMayHaveDescriptor0) {
   const ZipItem library = Library("lib/arm64-v8a/libfoo.so");
   PackageOnPhone file(MakePackage(WithLibraries({library})));
@@ -228,8 +228,8 @@ TEST(VeltSignJni, ALibraryOfAnotherAbiDoesNotEndTheWalkInEitherOrder) {
   EXPECT_GT(last, 0);
 }
 
-// Signs the libraries of a package with this entry, whose file is at `installed`. True if the
-// kernel received a request to sign that file.
+// Signs the libraries of a package that has one library, the entry `entry`. The library's file is
+// at `installed`. True if the kernel received a request to sign that file.
 bool IsFoundAt(const std::string& entry, const std::string& installed) {
   const ZipItem library = Library(entry);
   PackageOnPhone file(MakePackage(WithLibraries({library})));

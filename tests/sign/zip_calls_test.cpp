@@ -1,6 +1,6 @@
-// Tests those calls of the zip library that the tool's results do not show. The linker redirects
-// the tool's calls to the functions below, which then call the library. CMakeLists.txt has the
-// mangled names.
+// Tests the calls to the zip library that the tool's results do not show. The linker redirects the
+// tool's calls to the functions below, which then call the library. CMakeLists.txt has the mangled
+// names.
 #include <gtest/gtest.h>
 
 #include <algorithm>
@@ -19,7 +19,7 @@ namespace {
 constexpr int32_t kInvalidHandle = -4;  // the zip library's code
 
 struct ZipCalls {
-  std::vector<bool> ownership;       // whether archives own their descriptors
+  std::vector<bool> ownership;       // for each archive: true if it owns its descriptor
   std::vector<std::string> filters;  // "PREFIX SUFFIX" of each started iteration
   std::vector<void*> archives;       // the archive of each iteration
   std::vector<void*> open_cookies;   // of iterations that have not ended

@@ -145,7 +145,7 @@ TEST(ExitStatus, ThreeWhenTheToolIsNoProgram) {
 TEST(ExitStatus, ThreeWhenTheStandInsAreNotInTheTool) {
   if (AreProgramsEmulated()) GTEST_SKIP() << "the emulator hides that a program does not start";
   const TempDir directory;
-  // This tool is started without the settings for the loader.
+  // This tool is a script that starts `true` without LD_PRELOAD, so the stand-ins are not loaded.
   const std::string tool = directory.WriteProgram("tool", "#!/usr/bin/env -S -u LD_PRELOAD true\n");
   const ProcessResult result =
       RunProcess({SimulatorPath(), "--runner", "/nowhere/emulator", "--tool", tool, "/"});
@@ -337,7 +337,8 @@ TEST(ExitStatus, TwoWhenTwoOutputsAreOneFile) {
   }
 }
 
-// In one file, the two outputs would overwrite each other. A pipe accepts both in turn.
+// In one file, this output and the printed lines would overwrite each other. A pipe accepts both in
+// turn.
 TEST(ExitStatus, TwoWhenAnOutputIsAlsoStandardOutput) {
   const Probe probe({"sign 3 0000"});
   const auto told = [&probe](const std::string& rest) {

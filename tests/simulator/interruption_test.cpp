@@ -81,8 +81,8 @@ TEST(Interruption, OfTheWholeProcessGroupIsNoRefusal) {
   EXPECT_EQ(log["runs"][0]["invocations"][0]["executionSuccessful"], false);
 }
 
-// The tool has already ended when the signal comes. Without the verifier's answer there is no
-// result.
+// When the signal comes, the tool has already ended. The installer's verifier (here the script
+// "java") is still busy. Without its answer there is no result.
 TEST(Interruption, WhileTheInstallerIsAskedIsNoAnswerOfTheInstaller) {
   const TempDir directory;
   const std::string file = directory / "base.apk", pid = directory / "pid";
@@ -95,7 +95,8 @@ TEST(Interruption, WhileTheInstallerIsAskedIsNoAnswerOfTheInstaller) {
   EXPECT_EQ(kill(std::stoi(ContentOf(pid)), 0), -1) << "the verifier has ended, too";
 }
 
-// The reader takes one byte and ends. By then the large packages are being laid out.
+// The reader takes one byte and ends. By then the simulator is writing the libraries of the large
+// packages to temporary directories.
 TEST(Interruption, ByAReaderThatEndsLeavesNothingBehind) {
   const TempDir directory, temporary;
   PackageOptions large;
@@ -122,7 +123,8 @@ TEST(Interruption, ByAReaderThatEndsLeavesNothingBehind) {
   EXPECT_TRUE(std::filesystem::is_empty(temporary.path()));
 }
 
-// For example, nohup starts programs that ignore SIGHUP.
+// The simulator continues after such a signal. For example, nohup starts programs that ignore
+// SIGHUP.
 TEST(Interruption, IsNoneByASignalThatTheCallerIgnores) {
   const Probe slow({"sign 3 0000", "pid", "sleep 1"});
   const ProcessResult result = RunProcess(

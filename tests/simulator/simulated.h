@@ -7,7 +7,8 @@
 #include "support/process.h"
 #include "support/simulation.h"
 
-// Runs apktoolkit-sim in a UTF-8 locale, without an installer and without laying out packages.
+// Runs apktoolkit-sim in a UTF-8 locale. The phone's installer is not asked, and the libraries of
+// packages are not extracted.
 inline ProcessResult Told(const Lines& words) {
   Lines command = {"env", "LC_ALL=C.UTF-8", SimulatorPath(), "--installer=off", "--install=no"};
   command.insert(command.end(), words.begin(), words.end());

@@ -221,7 +221,8 @@ TEST(Simulation, WorksFromADirectoryThatTheLoaderCannotName) {
                    "  + key  registered for name"}));
 }
 
-// A runner that first executes the shell command `does`.
+// Writes a runner, a program that starts the tool. It first executes the shell command `does`.
+// Returns the runner's path.
 std::string RunnerThat(const std::string& does, const TempDir& directory) {
   return directory.WriteProgram("runner", "#!/bin/sh\n" + does + "\nshift\nexec env \"$@\"\n");
 }
@@ -302,7 +303,8 @@ TEST(Simulation, HandsNoOpenFileOfTheCallersToTheTool) {
   const ProcessResult result =
       RunProcess({"bash", "-c", "exec 3</dev/null 7</dev/null; exec \"$@\"", "bash",
                   SimulatorPath(), "--json", "--tool", PROBE_PATH, probe.path()});
-  // The probe opens its file first, as the tool does.
+  // The probe opens its file first. The file gets descriptor 3 only if the caller's descriptor 3 is
+  // closed.
   const std::vector<Json> events = OfKind(ParseJournal(result.output), "sign");
   ASSERT_EQ(events.size(), 1U);
   EXPECT_EQ(events[0]["path"], probe.path());
@@ -335,7 +337,7 @@ TEST(State, LastsForTheFilesOfOneRunWithoutADirectory) {
   EXPECT_EQ(verified[1]["result"], 0);
 }
 
-// The last runs begin after the first ones have ended.
+// The last runs begin after the first ones have ended, but do not know what those signed.
 TEST(State, IsNotSharedWhenSeveralFilesRunAtATime) {
   const Probe jar({"verify 3", "sign 3 0000"});
   const ProcessResult result = Simulated(

@@ -16,13 +16,13 @@
 enum class Digest { kMd5, kSha1, kSha256 };
 
 std::string DigestOid(Digest digest);        // of the digest itself
-std::string RsaSignatureOid(Digest digest);  // of RSA PKCS#1 v1.5 with it
+std::string RsaSignatureOid(Digest digest);  // of RSA PKCS#1 v1.5 with this digest
 Bytes DigestOf(Digest digest, const Bytes& data);
 // The PKCS#1 v1.5 signature by the RSA test key `key` (support/keys.h) over `data`; for an EC key,
 // the ECDSA signature.
 Bytes SignWith(const std::string& key, Digest digest, const Bytes& data);
 // The encoded message of the data (RFC 8017 §9.2) in `size` bytes. The padding fills the remaining
-// bytes and may be empty. Empty if the DigestInfo does not fit.
+// bytes and may be empty. Returns no bytes if the DigestInfo does not fit.
 Bytes EncodedMessage(Digest digest, const Bytes& data, size_t size);
 // An AlgorithmIdentifier with NULL or the given parameters.
 Bytes AlgorithmIdentifier(const std::string& oid, const Bytes& parameters = der::Null());

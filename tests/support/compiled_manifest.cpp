@@ -37,7 +37,7 @@ std::u16string ToUtf16(const std::string& text) {
   return units;
 }
 
-// A length of the UTF-8 pool: one byte, or two bytes with the highest bit of the first set.
+// A length in a UTF-8 pool: one byte, or two bytes, the first of which has its highest bit set.
 void PutLength8(Bytes& out, size_t length) {
   if (length > 0x7f) out.push_back(static_cast<uint8_t>(0x80 | (length >> 8)));
   out.push_back(static_cast<uint8_t>(length & 0xff));
@@ -50,7 +50,7 @@ void PutString8(Bytes& out, const std::string& text) {
   out.push_back(0);
 }
 
-// A length of the UTF-16 pool: one unit, or two units with the highest bit of the first set.
+// A length in a UTF-16 pool: one unit, or two units, the first of which has its highest bit set.
 void PutString16(Bytes& out, const std::string& text) {
   const std::u16string units = ToUtf16(text);
   if (units.size() > 0x7fff) Put16(out, static_cast<uint16_t>(0x8000 | (units.size() >> 16)));

@@ -13,7 +13,7 @@
 struct XmlAttribute {
   std::string name;
   uint8_t type;            // of the typed value (Res_value)
-  std::string text;        // the string for the raw value (and for a string's data)
+  std::string text;        // the raw value, and the typed value if its type is string
   bool has_raw = false;    // whether it has a raw value
   uint32_t data = 0;       // the typed value, unless it is a string
   std::string name_space;  // its URI; empty for none

@@ -10,7 +10,7 @@
 
 namespace der {
 
-// Identifier octets of the universal types in use, the constructed bit included.
+// Identifier octets of the universal types that the tests need, with the constructed bit.
 enum Identifier : uint8_t {
   kBoolean = 0x01,
   kInteger = 0x02,

@@ -34,11 +34,12 @@ Bytes PackagePayload(const std::string& key = "rsa-2048");
 
 // The parts that most journeys share.
 
-// VeltSignJni: its first line, the events of each library, its last line.
+// The events of VeltSignJni, the step that signs the libraries: its first log record, the events of
+// each library, and its last log record.
 std::string LibraryStep(std::initializer_list<std::string> libraries = {});
 // A library that matched the manifest and was signed.
 std::string SignedLibrary(const std::string& path, const Bytes& payload = PackagePayload());
-// VeltSign of a package that is good.
+// The events of VeltSign, the step that signs the package file, for a good package.
 std::string PackageStep(const std::string& path, const Bytes& payload = PackagePayload());
-// VeltSignJni and VeltSign of a package that is not good.
+// The events of both steps for a package that is not good.
 std::string NothingSigned(const std::string& path);

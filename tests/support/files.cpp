@@ -89,8 +89,8 @@ MemoryFile::MemoryFile(const Bytes& content, const std::string& name)
 
 MemoryFile::~MemoryFile() { close(fd_); }
 
-// Keeps the file under the number 100 + fd. The lowest free number may be one that another
-// FreeDescriptor frees.
+// Keeps the file under the number 100 + fd. dup() would choose the lowest free number, which
+// another FreeDescriptor may have to keep free.
 FreeDescriptor::FreeDescriptor(int fd) : fd_(fd), kept_(dup2(fd, 100 + fd)) { close(fd); }
 
 FreeDescriptor::~FreeDescriptor() {

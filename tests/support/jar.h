@@ -10,8 +10,8 @@
 // Returns the data in base64, in the standard alphabet and with padding.
 std::string Base64Encode(const Bytes& data);
 
-// The digest of the data in base64, by `attribute`: "MD5-Digest", "SHA1-Digest" or
-// "SHA-256-Digest". For any other attribute, the text "AAAA".
+// The digest of the data in base64. `attribute` chooses the algorithm: "MD5-Digest", "SHA1-Digest"
+// or "SHA-256-Digest". For any other attribute, the text "AAAA".
 std::string DigestText(const std::string& attribute, const Bytes& data);
 
 // A manifest or signature file, line by line. Each line has at most 72 bytes, including the CR LF

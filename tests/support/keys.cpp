@@ -11,9 +11,9 @@
 
 namespace {
 
-// On a phone, the keys are beside the program. A suite that separates programs by processor has
-// them one directory above. (This function does not call readlink, because the linker wraps
-// readlink in some tests.)
+// On a phone, the keys are beside the program, or one directory above it if the programs of each
+// processor have a directory of their own. (This function does not call readlink, because the
+// linker wraps readlink in some tests.)
 std::string KeysDirectory() {
   const std::string keys = TEST_KEYS_DIR;
   if (keys[0] == '/') return keys;

@@ -23,15 +23,15 @@ inline constexpr char kAndroidManifestName[] = "AndroidManifest.xml";
 struct PackageOptions {
   std::string package_name = "com.example.app";
   bool secure_storage = false;
-  // Replaces the compiled manifest of the two fields above. Empty bytes leave the entry out (a
-  // JAR).
+  // Replaces the compiled manifest that is made from the two fields above. Empty bytes leave the
+  // entry out (a JAR).
   std::optional<Bytes> android_manifest;
   // The entries other than the Android manifest, in the order of the archive.
   std::vector<ZipItem> entries = {{"classes.dex", ToBytes("dex\n035")},
                                   {"lib/arm64-v8a/libfoo.so", ToBytes("\177ELF foo")}};
 
   // The names of the digest attributes in the manifest's sections and in the signature file. The
-  // latter names get the suffix "-Manifest".
+  // attributes in the signature file get the suffix "-Manifest".
   std::vector<std::string> digests = {"SHA-256-Digest"};
   std::vector<std::string> signature_file_digests = {"SHA-256-Digest"};
   // The names of the signature file and of its block, without ".SF" and ".RSA".

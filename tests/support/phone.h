@@ -31,7 +31,7 @@ struct Phone {
   int zu_result = 0;              // the answer of libzu
   int zu_attribute_size = -1;     // of "user.zu", on every file; -1: the real attribute
   std::vector<int> nameless_fds;  // descriptors whose path cannot be resolved
-  // The result of fcntl for a request to sign or to verify, if its errno above is 0.
+  // The result of fcntl to sign (if sign_errno is 0) and to verify (if verify_errno is 0).
   int kernel_result = 0;
 
   // Called before the integrity file is opened: after all checks, and before the kernel signs.

@@ -1,4 +1,5 @@
-// RSA keys with both halves, their loaded contexts, and the blocks that signatures carry.
+// RSA keys with public and private key, a context of crypto/rsa.h for each, and the padded blocks
+// that they sign.
 #pragma once
 
 #include <gmpxx.h>
@@ -32,7 +33,7 @@ inline mpz_class ToNumber(const Bytes& bytes) {
   return number;
 }
 
-// One of the fixed keys. libcrypto has its private half.
+// One of the fixed keys (support/keys.h). libcrypto makes its signatures.
 struct FixedKey {
   explicit FixedKey(const std::string& name)
       : rsa(TestRsaKey(name)),
@@ -95,7 +96,7 @@ struct SmallKey {
   rsa_local context;
 };
 
-// A block of type 1 of `size` bytes.
+// A padded block of `size` bytes with block type 1 and `info` at its end.
 inline Bytes Block(size_t size, const Bytes& info) {
   return Concat({{0x00, 0x01}, Bytes(size - 3 - info.size(), 0xFF), {0x00}, info});
 }

@@ -24,7 +24,7 @@ struct SignatureBlock {
   // The signature covers other bytes than the signature file.
   bool wrong_digest = false;
 
-  // The contents of the [0] of certificates; an empty value is an empty set.
+  // The contents of the element [0], which has the certificates; empty: no certificates.
   std::optional<Bytes> certificates;
   std::optional<Bytes> digest_algorithm;  // the SignerInfo's
   std::optional<Bytes> encrypted_digest;  // the whole OCTET STRING
@@ -34,8 +34,9 @@ struct SignatureBlock {
 
   // The signer's certificate in the block, unless `certificates` is set.
   Certificate SignerCertificate() const;
-  // The signer's SignerInfo over the signature file's bytes, and the block.
+  // The SignerInfo of the signer, who signs the bytes of the signature file.
   Bytes SignerInfo(const Bytes& signature_file) const;
+  // The whole signature block for this signature file.
   Bytes Build(const Bytes& signature_file) const;
 
  private:

@@ -52,7 +52,8 @@ ArchiveParts TakeApart(const Bytes& archive) {
   return parts;
 }
 
-// The digest over the digests of all chunks of 1 MiB of the three parts.
+// Splits each of the three parts into chunks of at most 1 MiB. Returns the digest over the digests
+// of all chunks.
 Bytes DigestOfChunks(const ArchiveParts& parts) {
   constexpr size_t kChunk = 1 << 20;
   Bytes digests;

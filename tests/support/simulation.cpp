@@ -9,8 +9,8 @@
 
 namespace {
 
-// The journal without the platform libraries' own log records and without the events about the
-// simulation itself, which come before and after all others.
+// The journal without the log records of the platform libraries. The events about the simulation
+// itself, which come before and after all others, are also left out.
 std::string TimelineOf(const std::string& journal) {
   std::istringstream lines(journal);
   std::string line;

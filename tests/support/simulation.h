@@ -10,9 +10,9 @@ struct Simulation {
 };
 
 // Runs the tool on `file` in the simulated phone that `options` describe. Here and below, no
-// phone's installer is asked and no library is laid out, unless an option says so. Most tests check
-// the tool's own answers about files in the places where the test put them. The test fails if the
-// simulation itself fails or writes anything to standard error.
+// phone's installer is asked, and no library is extracted for the tool (--install), unless an
+// option says so. Most tests check the tool's own answers about files in the places where the test
+// put them. The test fails if the simulation itself fails or writes anything to standard error.
 Simulation Simulate(const std::string& file, const std::vector<std::string>& options = {});
 
 // The same, with words before the simulator's command and with a working directory.

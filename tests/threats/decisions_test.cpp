@@ -27,8 +27,9 @@ Bytes WithForgedBlock(const Bytes& exponent) {
   return ToBytes(ContentOf(apk));
 }
 
-// Bytes of different lengths that are read as the exponents 1 and -1. Bytes 5 to 8 overwrite the
-// length of the modulus, and must keep it at 256: 00 01 00 00 in host byte order.
+// The first four bytes of each exponent are read as 1 or -1. Bytes 5 to 8, if there are any,
+// overwrite the length of the modulus. They are the first bytes of 00 01 00 00, which is 256 in
+// host byte order, so that the length does not change.
 TEST(Threat, AnExponentOfOneIsRefusedInEveryForm) {
   for (const char* exponent :
        {"01", "01 00", "01 00 00", "01 00 00 00", "FF FF FF FF", "01 00 00 00 00 01",

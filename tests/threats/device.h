@@ -1,4 +1,5 @@
-// Runs the whole tool on a file on disk, on a healthy phone inside the test program.
+// Runs the tool's three steps (sign the libraries, sign the file, register the key) on a file on
+// disk. Inside the test program, a Phone takes the place of the kernel and of libzu.
 #pragma once
 
 #include <fcntl.h>
@@ -36,11 +37,11 @@ class Device {
     temp_.Write("app/" + path, content);
     return *this;
   }
-  // The absolute path.
+  // The absolute path for a path relative to the package's directory.
   std::string Path(const std::string& path) const { return temp_ / ("app/" + path); }
 
-  // Runs the steps. Returns the names of the files that were signed with the payload for the key of
-  // `signer`, in order, relative to the directory above the package's directory.
+  // Runs the steps. Returns the files that were signed with the payload for the key of `signer`, in
+  // order. Their names are relative to the directory above the package's directory.
   Strings FilesSignedFor(const std::string& signer) {
     const std::string payload = "2000" + Hex(DigestOf(Digest::kSha256, ModulusOf(signer)));
     return FilesSignedWith(payload);

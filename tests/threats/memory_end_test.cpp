@@ -1,5 +1,5 @@
-// Tests documents and manifests at the very end of memory. If the platform's parser or the tool's
-// parser reads beyond them, the test crashes.
+// Tests documents and manifests in a block at the end of the readable memory. If the platform's
+// parser or the tool's parser reads beyond the block, the test crashes.
 #include <gtest/gtest.h>
 
 #include "apk/apk.h"
@@ -12,8 +12,8 @@
 namespace {
 
 // Parses the document at the end of memory, in the block that the tool allocates for it. The block
-// is 20 bytes longer than the document. A missing attribute (20 bytes) or chunk header (8 bytes)
-// fits in these 20 bytes.
+// is 20 bytes longer than the document, because the platform's parser reads an attribute (20 bytes)
+// or a chunk header (8 bytes) before it checks that the document contains it.
 bool ParseAtMemoryEnd(ApkTools::Apk* apk, const Bytes& document) {
   PutNextBlockAtMemoryEnd(document.size() + 20);
   const bool parsed = apk->ParseAndroidManifest(document);
@@ -103,8 +103,8 @@ TEST(EntryDigestsAtMemoryEnd, AreSortedWithoutOneMore) {
   EXPECT_EQ(digest, "1");
 }
 
-// The table is full when it is sorted, at the 33rd attribute. The name of that attribute is the
-// first that starts at offset 1024 or later in the text.
+// The table is sorted when a name starts at offset 1024 of the text or later. Here, that is the
+// name of the 33rd attribute (32 * 32 = 1024), which also fills the table.
 TEST(ManifestSectionsAtMemoryEnd, AreNotReadBeyondTheLastAttribute) {
   constexpr uint32_t kAttributes = 33;
   std::string text;
@@ -121,8 +121,9 @@ TEST(ManifestSectionsAtMemoryEnd, AreNotReadBeyondTheLastAttribute) {
   EXPECT_EQ(sections[0].find("83"), std::string(30, 'v'));
 }
 
-// Names and values of 1 to 19 bytes: the parser reads eight bytes at once. The text is cut at each
-// multiple of 4 bytes, because only a block of such a size ends exactly where memory ends.
+// Names and values have 1 to 19 bytes, because the parser reads eight bytes at once. The text is
+// cut at each multiple of 4 bytes, because only a block of such a size ends exactly where memory
+// ends.
 TEST(JarManifestAtMemoryEnd, IsNotReadBeyondAtAnyLength) {
   for (size_t length = 1; length < 20; ++length) {
     const std::string run(length, 'v');

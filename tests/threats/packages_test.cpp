@@ -49,7 +49,8 @@ INSTANTIATE_TEST_SUITE_P(Rsa, KeyOfApksigner,
                                          "rsa-2048-e17", "rsa-2048-other", "rsa-3072", "rsa-4096"),
                          NameOf);
 
-// ---- The installer checks the newer signing block. Then only this tool checks META-INF.
+// ---- If a package has an APK signing block, the installer checks that block. Only this tool then
+// checks META-INF.
 
 class ForeignMetaInf : public testing::TestWithParam<const char*> {
  protected:

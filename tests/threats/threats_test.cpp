@@ -118,9 +118,9 @@ TEST(Threat, DotsInAnEntryNameSignNoFileOutsideWithOtherBytes) {
   EXPECT_EQ(device.FilesSignedFor("rsa-2048"), Strings({"app/base.apk"}));
 }
 
-// Expects that the program is signed through the link that `lead` makes. The name of the program
-// does not end in ".so". The attacker knows the program's bytes, and the manifest lists their
-// digest.
+// `lead` makes a link to a program where the library's file should be. Expects that the program is
+// signed through this link. The name of the program does not end in ".so". The attacker knows the
+// program's bytes, and the manifest lists their digest.
 void ExpectProgramSigned(const std::function<int(const char* program, const char* name)>& lead) {
   Device device(MakePackage(WithLibrariesNamed({"lib/arm64-v8a/../../../mine/libx.so"})));
   device.Install("lib/arm64/x", {}).Install("../mine/x", {}).Install("../system/program", kLibrary);
@@ -203,8 +203,8 @@ Strings LibrariesWalked(const Package& package) {
   return names;
 }
 
-// The zip library compares an entry's two headers when the iteration reaches the entry. If they
-// differ, it ends the iteration there.
+// The zip library compares an entry's two headers when the iteration reaches the entry. If the
+// headers differ, the library ends the iteration there.
 TEST(Threat, ADamagedLibraryEndsTheWalkAndIntactOnesBehindItStayUnsigned) {
   const Strings names = {"lib/arm64-v8a/liba.so", "lib/arm64-v8a/libb.so", "lib/arm64-v8a/libc.so"};
   const Package intact = MakePackage(WithLibrariesNamed(names));
@@ -261,7 +261,7 @@ TEST(Threat, ALibraryThatIsWrittenToInPlaceAfterItsChecksIsSigned) {
   EXPECT_EQ(BytesSigned(device)[library], "\177ELF Foo");
 }
 
-// Further writes to a dirty page do not change the file's times.
+// A write through the mapping to a page that is already dirty does not change the file's times.
 TEST(Threat, ALibraryThatIsWrittenToThroughAMappingAfterItWasReadIsSigned) {
   Device device(MakePackage());
   device.Install("lib/arm64/libfoo.so", kLibrary);

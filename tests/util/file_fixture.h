@@ -11,7 +11,7 @@
 
 #include "support/files.h"
 
-// The functions that a test replaces. A call of any other function goes to the kernel.
+// The functions that a test replaces. A function that a test does not set calls the kernel.
 struct Kernel {
   std::function<int(struct stat*)> fstat;
   std::function<off_t(int whence)> lseek;
@@ -26,7 +26,7 @@ extern "C" ssize_t __real_read(int fd, void* buffer, size_t size);
 
 class FileFixture : public testing::Test {
  protected:
-  void SetUp() override { alarm(60); }  // ends a test that waits for a FIFO
+  void SetUp() override { alarm(60); }  // seconds; ends a test that waits for a FIFO
   void TearDown() override {
     kernel = Kernel();
     alarm(0);

@@ -266,7 +266,7 @@ TEST_F(ReadFileTest, DescriptorOfADirectoryHasNoSizeAndStaysOpen) {
 
 // ---- The memory of the vector.
 
-// tests/apk/memory_test.cpp checks that the former memory is freed first.
+// tests/apk/memory_test.cpp checks that ReadFile frees the vector's former memory first.
 TEST_F(ReadFileTest, EmptyVectorGetsNoMoreMemoryThanTheFileNeeds) {
   Bytes out(1000);
   out.clear();

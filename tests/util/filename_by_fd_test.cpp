@@ -39,14 +39,15 @@ TEST_F(GetFilenameByFdTest, ClosedDescriptorHasNoPath) {
   EXPECT_EQ(Records(), log.records());
 }
 
-// Nested directories. Each is made and opened relative to its parent, because the full path may be
-// longer than the kernel accepts. The destructor removes them.
+// Nested directories, of which the innermost has a path of `path_length` bytes. Each one is made
+// and opened relative to its parent, because the full path may be longer than the kernel accepts.
+// The destructor removes them.
 class DeepDirectory {
  public:
   DeepDirectory(const std::string& top, size_t path_length) {
     fds_.push_back(open(top.c_str(), O_RDONLY | O_DIRECTORY | O_CLOEXEC));
     for (size_t length = top.size(); length < path_length;) {
-      // A remainder of one byte would only have room for a slash.
+      // Each step adds a slash and a name. One remaining byte would be enough only for the slash.
       size_t step = std::min<size_t>(path_length - length, 200);
       if (path_length - length - step == 1) --step;
       names_.push_back(std::string(step - 1, 'd'));

@@ -1,6 +1,6 @@
 // Tests rsa_pkcs1_verify on vectors in the format of Project Wycheproof's
-// rsa_signature_*_test.json: the project's own, Wycheproof's for SHA-256 and keys of 2048 and 3072
-// bits, and those of a directory that the build was configured with.
+// rsa_signature_*_test.json: the vectors of this project, those of Wycheproof for SHA-256 and keys
+// of 2048 and 3072 bits, and those in the directory APKTOOLKIT_WYCHEPROOF_DIR of the build.
 #include <gtest/gtest.h>
 #include <openssl/bn.h>
 #include <openssl/nid.h>
@@ -22,10 +22,11 @@ namespace {
 
 using nlohmann::json;
 
-// Flags of vectors whose result may differ from the tool's verdict. The first is the project's own:
-// these vectors are invalid by the standard and accepted on purpose. The second is Wycheproof's:
-// the signature is made with another digest than the key is for. The tool accepts any digest that
-// it knows, because the signature itself names its digest.
+// Flags of vectors whose result may differ from the tool's verdict. AcceptedShortPadding is this
+// project's flag. It marks vectors that are invalid by RFC 8017, and that the tool accepts on
+// purpose. WrongHash is Wycheproof's flag. It marks signatures that are made with another digest
+// than the key is for. The tool accepts any digest that it knows, because the signature itself
+// names its digest.
 constexpr char kAcceptedShortPadding[] = "AcceptedShortPadding";
 constexpr char kWrongHash[] = "WrongHash";
 
@@ -66,7 +67,8 @@ Bytes WithoutLeadingZeros(Bytes number) {
 
 class Key {
  public:
-  // An older group has the key's numbers in "n" and "e". A newer group has them in "publicKey".
+  // In an older file, a test group has the key's numbers in "n" and "e". In a newer file, it has
+  // them in "publicKey".
   explicit Key(const json& group) {
     const bool is_newer = group.contains("publicKey") && group["publicKey"].is_object();
     const json& key = is_newer ? group["publicKey"] : group;
@@ -118,6 +120,7 @@ bool HasFlag(const json& test, const char* flag) {
   return std::find(flags.begin(), flags.end(), flag) != flags.end();
 }
 
+// Compares the tool's verdict on a vector with the vector's own result, and counts the vector.
 void Judge(const Key& key, const std::string& sha, const json& test, Counts* counts) {
   const Bytes message = FromHex(test.at("msg"));
   const Bytes signature = FromHex(test.at("sig"));
@@ -142,6 +145,8 @@ void Judge(const Key& key, const std::string& sha, const json& test, Counts* cou
       << "test " << test.at("tcId") << ": " << test.value("comment", "");
 }
 
+// Judges the vectors of a file, and returns how many had each outcome. Leaves out keys whose
+// exponent does not fit in the tool's 4 bytes.
 Counts JudgeFile(const std::string& path) {
   SCOPED_TRACE(path);
   std::ifstream file(path);
@@ -208,7 +213,8 @@ GTEST_ALLOW_UNINSTANTIATED_PARAMETERIZED_TEST(VectorsOfTheDirectory);
 INSTANTIATE_TEST_SUITE_P(Files, VectorsOfTheDirectory, testing::ValuesIn(NamesInTheDirectory()),
                          [](const auto& parameter) { return parameter.param; });
 
-// If the project has a copy of a file's numbers, take_wycheproof must print the same copy.
+// If this project has a copy of the file's numbers (wycheproof_*.json), take_wycheproof must print
+// exactly this copy.
 TEST_P(VectorsOfTheDirectory, AreJudgedAsTheySay) {
   EXPECT_GT(JudgeFile(file_).refused, 0);
   std::string kept = GetParam() + ".json";

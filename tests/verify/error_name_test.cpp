@@ -5,7 +5,8 @@
 #include <climits>
 #include <cstring>
 
-// Compares all numbers up to 4095, the highest that a system call can return.
+// Compares the names of all error numbers with those of the C library. The highest number that a
+// system call can return is 4095.
 TEST(ErrorName, IsTheNameThatTheCLibraryHas) {
   constexpr int kLast = 4095;
   int named = 0;

@@ -14,7 +14,7 @@ using namespace simulator;
 
 namespace {
 
-// While it lives, `script` is the first program named java on PATH.
+// While an object exists, `script` is the first program named java on PATH.
 class FakeJava {
  public:
   explicit FakeJava(const std::string& script) : path_(getenv("PATH")) {
@@ -37,7 +37,7 @@ constexpr char kRefusal[] =
 InstallerOptions Patient(double seconds) {
   InstallerOptions options;
   options.timeout = seconds;
-  options.program = "/proc/self/exe";  // it is never run
+  options.program = "/proc/self/exe";  // any readable file; the fake java does not use it
   return options;
 }
 

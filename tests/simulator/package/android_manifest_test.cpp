@@ -19,7 +19,8 @@ XmlAttribute Boolean(const std::string& name, bool value) {
 
 constexpr CompiledXml::Pool kPools[] = {CompiledXml::Pool::kUtf8, CompiledXml::Pool::kUtf16};
 
-// The value that is read from a manifest whose application has these attributes.
+// The value of extractNativeLibs that is read from a manifest whose application has these
+// attributes.
 std::optional<bool> Extracts(const std::vector<XmlAttribute>& attributes,
                              CompiledXml::Pool pool = CompiledXml::Pool::kUtf8) {
   CompiledXml xml(pool);
@@ -29,18 +30,18 @@ std::optional<bool> Extracts(const std::vector<XmlAttribute>& attributes,
   return ParseAndroidManifest(xml.Build()).extracts_libraries;
 }
 
-// Returns the document with every offset of its pool leading to the longest string. Together, the
-// strings are then about 90 times as long as the document: 203 strings of 5000 bytes, and a
-// document of 11244 bytes.
+// Returns the document after every offset in its string pool was changed to that of the longest
+// string. The 203 strings then have 5000 bytes each, together about 90 times the 11244 bytes of the
+// document.
 Bytes WithStringsInOneAnother(Bytes bytes) {
   constexpr size_t kPool = 8;          // after the document's header
   constexpr size_t kOffsets = 8 + 28;  // after the pool's header
-  // The next string starts more than 5000 bytes after the start of the longest string.
   const auto number = [&bytes](size_t at) {
     return bytes[at] | bytes[at + 1] << 8 | bytes[at + 2] << 16 | bytes[at + 3] << 24;
   };
   const int count = number(kPool + 8);
   EXPECT_GT(count, 200);
+  // Only the string after the longest one starts more than 5000 bytes after the previous string.
   int longest = 0;
   for (int i = 0; i + 1 < count; ++i) {
     const size_t at = kOffsets + 4 * static_cast<size_t>(i);

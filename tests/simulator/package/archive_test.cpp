@@ -61,7 +61,8 @@ TEST(Archive, DamagedEntryIsNamedAndEndsNothing) {
             Lines({"a 9", "b 9 damaged", "c 9"}));
 }
 
-// The library chooses the order of the walk, so the test tries each place of the damaged entry.
+// The zip library chooses the order in which Walk() meets the entries, so the test damages each
+// entry in turn.
 TEST(Archive, WalkTellsWhereTheToolsEnds) {
   const Lines names = {"lib/x/a.so", "lib/x/b.so", "lib/x/c.so"};
   const Lines order = WalkOf(BuildZip({Good(names[0]), Good(names[1]), Good(names[2])})).names;
@@ -118,7 +119,8 @@ TEST(Archive, LongEntriesAreNotRead) {
   EXPECT_EQ(content.size(), Archive::kLongestRead);
 }
 
-// If a length does not fit the data, the entry is damaged, even if the length is above the limit.
+// An entry whose length does not fit its data is damaged, and not too long, even if this length is
+// above kLongestRead.
 TEST(Archive, EntryThatClaimsTooMuchIsDamaged) {
   const MemoryFile file(BuildZip(
       {ClaimingLength({"liar", Bytes(100, 'a'), true}, Archive::kLongestRead + 1), Good("a")}));
@@ -205,8 +207,8 @@ Lines NamesAfter(const std::function<void(Bytes* zip, ptrdiff_t directory)>& cha
   return names;
 }
 
-// A central directory header has 46 bytes, the name and two more fields. The lengths of these two
-// fields are at the offsets 30 and 32 (APPNOTE.TXT 4.3.12).
+// A central directory header has 46 bytes, then the name, the extra field and the comment. The
+// lengths of the extra field and the comment are at the offsets 30 and 32 (APPNOTE.TXT 4.3.12).
 TEST(ReadDirectory, PassesOverWhatStandsBehindTheNames) {
   const auto add = [](Bytes* zip, ptrdiff_t directory) {
     const Bytes more = ToBytes("extracomment");

@@ -58,8 +58,8 @@ TEST(CertificateFacts, OfAnRsaKey) {
   EXPECT_TRUE(facts->is_self_issued);
 }
 
-// The last second can be before 1970 or after 2049 (RFC 5280 §4.1.2.5). The expected values are
-// those of openssl and date.
+// The last second of the validity can be before 1970 or after 2049 (RFC 5280 §4.1.2.5). The
+// expected values are those of openssl and date.
 TEST(CertificateFacts, LastSecond) {
   const auto last = [](uint8_t tag, const std::string& end) {
     Certificate certificate = Of("rsa-2048");

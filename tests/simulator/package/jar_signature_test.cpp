@@ -1,4 +1,5 @@
-// The facts of a JAR signature, as the tool's own code and as other readers find them.
+// The facts of a JAR signature. The tool's own code finds some of them, and other parsers find the
+// rest.
 #include <gtest/gtest.h>
 
 #include <algorithm>
@@ -45,8 +46,8 @@ TEST(ToolKey, IsThatOfTheCertificate) {
   EXPECT_FALSE(jar.names_other_certificate);
 }
 
-// An exponent of eight bytes overwrites the modulus length. Its last four bytes are 100 in the byte
-// order of the host.
+// The last four bytes of an eight-byte exponent overwrite the tool's modulus length. Here they are
+// 100 in the byte order of the host.
 TEST(ToolKey, MayBeAPartOfTheModulus) {
   const JarSignatureFacts jar =
       SignatureOf(WithKey(Concat({{0}, Modulus()}), {1, 0, 1, 0, 100, 0, 0, 0}));
@@ -92,8 +93,7 @@ TEST(ToolKey, OfAnEcKeyIsNone) {
   EXPECT_EQ(jar.certificate->key.algorithm, "EC");
 }
 
-// If the tool can read the block, the certificate is shown only if a strict reader finds the same
-// certificate.
+// The facts have no certificate if the strict DER parser does not find the tool's certificate.
 TEST(JarSignatureFacts, CertificateThatTheToolDoesNotReadIsNotShown) {
   Package package = MakePackage();
   Bytes& block = package.Item("META-INF/CERT.RSA").data;
@@ -117,7 +117,8 @@ TEST(JarSignatureFacts, SignerThatNamesAnotherCertificateIsSeen) {
   options.block.serial = der::Integer(99);
   EXPECT_TRUE(SignatureOf(MakePackage(options)).names_other_certificate);
   EXPECT_FALSE(SignatureOf(MakePackage()).names_other_certificate);
-  // A block without a readable signer names no certificate. The certificate has a key identifier.
+  // A block without a readable signer names no certificate. Its empty signer identifier must not be
+  // compared with the key identifier of this certificate.
   Certificate certificate;
   certificate.extensions = {Extension("2.5.29.14", der::OctetString({1, 2, 3}))};
   options.block.certificates = certificate.Build();

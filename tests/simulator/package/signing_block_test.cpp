@@ -91,7 +91,8 @@ TEST(SigningBlock, SignersBeyondReasonAreNotRead) {
 
 namespace {
 
-// The result for an archive with `block` before its central directory.
+// Returns the result of ReadSigningBlock() for an archive with `block` before its central
+// directory.
 std::string ReadFrom(const Bytes& block, const std::string& comment = "",
                      bool expect_too_large = false) {
   const MemoryFile file(ArchiveWithBlock(BuildZip({{"a", ToBytes("data")}}), block, comment));
@@ -103,9 +104,9 @@ std::string ReadFrom(const Bytes& block, const std::string& comment = "",
   return read;
 }
 
-// A block of `size` bytes after its first size field.
+// A signing block that has `size` bytes after its first size field.
 Bytes BlockOfSize(uint64_t size) {
-  // The other bytes are the second size, the magic, and the size and the ID of the pair.
+  // Subtracts the second size, the magic, and the size and the ID of the pair.
   return SigningBlockBytes({{7, Bytes(static_cast<size_t>(size) - 8 - 16 - 8 - 4, 0)}});
 }
 

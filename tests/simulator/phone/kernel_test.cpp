@@ -123,8 +123,8 @@ TEST(KernelVerify, RefusesWithTheErrorOfThePhone) {
 }
 
 TEST(KernelFcntl, OtherCommandsGoToTheRealKernel) {
-  // The commands next to the feature's own, an unknown command, a descriptor that is not open, and
-  // commands with an argument.
+  // The numbers next to the feature's own commands (1124 and 1125), an unknown command, a
+  // descriptor that is not open, and commands with an argument.
   const Lines commands = {"fcntl 3 1123 0",
                           "fcntl 3 1126 0",
                           "fcntl64 3 1123 0",
@@ -139,7 +139,7 @@ TEST(KernelFcntl, OtherCommandsGoToTheRealKernel) {
   const std::string not_open = Refusal(AreProgramsEmulated() ? EINVAL : EBADF);
   EXPECT_EQ(run.results, Lines({Refusal(EINVAL), Refusal(EINVAL), Refusal(EINVAL), Refusal(EINVAL),
                                 not_open, "0 77", "40 77", "50 77", "1 77"}));
-  EXPECT_EQ(run.events.size(), 1U);  // the exit
+  EXPECT_EQ(run.events.size(), 1U);  // the event "exit"
 }
 
 TEST(KernelStandIn, KeepsItsDescriptorsHighAndToItself) {
@@ -147,7 +147,7 @@ TEST(KernelStandIn, KeepsItsDescriptorsHighAndToItself) {
                      "fopen /proc/self/integrity/value r", "open /", "inherited"});
   const ProbeRun run = probe.Run();
   ASSERT_EQ(run.results.size(), 7U);
-  // The probe has its script at 3 and its results at 4.
+  // The probe has its script at descriptor 3 and its results at descriptor 4.
   EXPECT_EQ(run.results[0], "5 77");
   EXPECT_EQ(run.results[5], "6 77");
   // A program that the tool starts with exec has the same open descriptors as without the

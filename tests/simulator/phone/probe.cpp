@@ -1,7 +1,7 @@
-// A stand-in for the tool: executes the lines of its one file, and writes their results to
-// FILE.out. A line is a command and its arguments. Its result is "RESULT ERRNO"; errno was 77
-// before the command. In place of the digits of a payload, "null", "wild" and "cut" name memory
-// that cannot be read. "cut" is a payload that continues into an unmapped page.
+// probe FILE: takes the place of the tool in tests. Executes the lines of FILE, each of which is a
+// command and its arguments. For each command, writes the line "RESULT ERRNO" to FILE.out. errno is
+// set to 77 before the command. In place of the digits of a payload, "null", "wild" and "cut" name
+// memory that cannot be read. "cut" is a payload that continues into an unmapped page.
 #include <fcntl.h>
 #include <sys/mman.h>
 #include <sys/resource.h>
@@ -200,7 +200,8 @@ int main(int argc, char** argv) {
   const ssize_t length = read(fd, script.data(), script.size());
   if (length < 0) return 1;
   script.resize(static_cast<size_t>(length));
-  // The results are opened before any command runs. The commands therefore get later descriptors.
+  // The file of the results is opened before any command runs. The files that commands open
+  // therefore get higher descriptors.
   std::ofstream out(argv[1] + std::string(".out"));
   out << "fd " << fd << std::endl;
   std::istringstream lines(script);

@@ -30,7 +30,7 @@ ProbeRun Probe::Run(const Lines& options) const {
   run.status = result.status;
   run.errors = result.errors;
   run.results = LinesOf(ContentOf(path() + ".out"));
-  // The first line is the probe's own open, and not a command.
+  // The first line is not the result of a command. It has the probe's descriptor for its script.
   EXPECT_EQ(run.results.empty() ? "" : run.results[0], "fd 3");
   if (!run.results.empty()) run.results.erase(run.results.begin());
   run.events = ParseJournal(result.output);

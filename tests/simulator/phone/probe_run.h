@@ -12,8 +12,8 @@ using Json = nlohmann::json;
 
 struct ProbeRun {
   int status = 0;            // of apktoolkit-sim
-  std::string errors;        // its standard error, and the probe's
-  Lines results;             // of each command: "RESULT ERRNO"; errno was 77 before
+  std::string errors;        // the standard error of apktoolkit-sim and of the probe
+  Lines results;             // one per command: "RESULT ERRNO"; errno is 77 before it
   std::vector<Json> events;  // the journal, from the event after "attached" to "exit"
 };
 

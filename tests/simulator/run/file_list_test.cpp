@@ -113,7 +113,7 @@ TEST(FileList, ListsAreReadByLinesOrByNulBytes) {
   const std::string with_nul = std::string("a\nb") + '\0' + '\0' + "c" + '\0';
   const std::string nul = directory.Write("nul", ToBytes(with_nul));
   EXPECT_EQ(Listed(directory, {{}, nul, true, false}), Lines({"a\nb", "c"}));
-  // The part of a name after a NUL byte would be lost.
+  // Without -0, the part of a name after a NUL byte would be lost, so the list is an error.
   EXPECT_EQ(
       Listed(directory, {{}, nul, false, false}),
       Lines({"the list " + nul + " contains NUL bytes; use -0 if its names end with NUL bytes"}));

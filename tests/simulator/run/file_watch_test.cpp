@@ -35,8 +35,8 @@ void SetBytes(const std::string& file, const char* bytes) {
   close(fd);
 }
 
-// Writes `bytes` and restores the mtime, so that only the ctime differs. chmod also changes only
-// the ctime. A program can hide a change of the bytes in the same way.
+// Writes `bytes` and restores the mtime, so that only the ctime differs. A program can hide a
+// change of the bytes in this way. chmod also changes only the ctime, but no bytes.
 void ChangeTheInodeAlone(const std::string& file, const char* bytes) {
   struct stat before = {};
   ASSERT_EQ(stat(file.c_str(), &before), 0);

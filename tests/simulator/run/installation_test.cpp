@@ -23,7 +23,7 @@ namespace fs = std::filesystem;
 
 const Deadline kLater(1e6);
 
-// "path content" of each file that is laid out beside the package.
+// "path content" of each file that the installation extracts beside the package.
 std::vector<std::string> LaidOutOf(const PackageOptions& package, InstalledAbi abi,
                                    std::vector<std::string>* left_out = nullptr) {
   const TempDir directory;
@@ -112,7 +112,7 @@ TEST(Installation, NamesDoNotLeadOutOfTheirDirectory) {
                              "lib/libd.so"}));
 }
 
-// A name has at most 255 bytes.
+// A file name has at most 255 bytes.
 TEST(Installation, NamesThatNoFileCanHaveAreLeftOut) {
   const std::string longest = std::string(252, 'l') + ".so";
   Files left_out;
@@ -241,7 +241,8 @@ TEST(Installation, IsGoneWithItsOwner) {
   EXPECT_TRUE(fs::exists(file));
 }
 
-// A file without a name cannot get a hard link, like a file on another file system.
+// A hard link to a file in memory (memfd) is impossible, like a hard link to a file on another file
+// system. The package is therefore copied.
 TEST(Installation, OfAFileThatCannotBeLinkedIsACopyAndNotForEver) {
   const TempDir directory;
   MakePackage(WithLibraries({{"lib/arm64-v8a/liba.so", Bytes(3 << 20, 'a')}}))

@@ -1,4 +1,5 @@
-// The step that the tool is in, and the file that each answer of the kernel belongs to.
+// Tests to which file TakeApart assigns an answer of the kernel. This depends on the step that the
+// tool is in, and on the path.
 #include "simulator/run/run_record.h"
 
 #include <gtest/gtest.h>

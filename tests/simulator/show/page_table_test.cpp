@@ -1,4 +1,5 @@
-// The table of files: its order, its cells, the choices and the directory.
+// The page's table of files: the order of its rows, its cells, the choice of the files to show, and
+// the directory that all files have in common.
 #include "simulator/show/page_table.h"
 
 #include <gtest/gtest.h>

@@ -24,8 +24,8 @@ TEST(DrawnBar, HasEachPartAndWhatLiesBetweenTheEntries) {
   EXPECT_FALSE(parts[4].has_entries);
 }
 
-// Each of the five parts is at least 0.75 wide. The parts share the remaining 96.25 by their bytes.
-// The first part is 0.75 plus half of 96.25, which is 48.875.
+// The bar is 100 wide. Each of its five parts is at least 0.75 wide, and the parts share the
+// remaining 96.25 by their bytes. The first part has half of the bytes: 0.75 + 96.25 / 2 = 48.875.
 TEST(DrawnBar, IsAsWideAsItMayBeAndShowsTheLeastByte) {
   const auto parts = DrawBar({{1, 500'000}, {1, 499'000}, {1, 1}, {1, 499}, {}}, 1'000'000);
   EXPECT_DOUBLE_EQ(parts[0].width, 48.875);

@@ -175,7 +175,7 @@ TEST(ReportText, OneLongNameMovesNoOther) {
   EXPECT_EQ(column(longest + "l"), 4U + 40 + 2);
 }
 
-// A cure that neighbours share is printed once.
+// Neighbouring items with the same cure print it once.
 TEST(ReportText, NeighboursShareWhatToDo) {
   Report report = Example();
   report.items = {

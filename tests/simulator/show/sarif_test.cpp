@@ -108,8 +108,8 @@ TEST(Sarif, RefusalThatFollowsFromAnotherIsNoResultOfItsOwn) {
   EXPECT_EQ(ResultsOf(LogOf({refused})), Lines({"error package-refused b.apk"}));
 }
 
-// A reader that counts results finds an error, and a reader that looks at the run finds that it
-// failed.
+// A program that reads only the results finds an error. A program that reads only `invocations`
+// finds that the run failed.
 TEST(Sarif, FileThatWasNotJudgedIsAnErrorAndTheRunWasNotSuccessful) {
   for (const Verdict verdict : {Verdict::kNotLookedAt, Verdict::kNotSimulated}) {
     Report report;

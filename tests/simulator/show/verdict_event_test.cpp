@@ -199,8 +199,8 @@ TEST(VerdictEvent, EveryStateOfALinkHasACode) {
   EXPECT_EQ(chain[2]["state"], "not-reached");
 }
 
-// The key of the JAR signature is the one that the kernel got, even if no certificate shows this
-// key.
+// The event reports the key that the kernel got as the key of scheme v1, even if no certificate has
+// this key.
 TEST(VerdictEvent, KeyThatNoCertificateShowsIsTold) {
   Report report;
   report.key = {"ab", 2048, true};

@@ -85,7 +85,7 @@ TEST(InstallerItem, NamesTheEntry) {
             start + "a/b was added after signing: the manifest does not list it");
   EXPECT_EQ(Why({"JAR_SIG_DUPLICATE_ZIP_ENTRY", {"a/b"}, ""}),
             start + "a/b is in it more than once");
-  // If an answer lacks the parameter, the item shows the text of the answer.
+  // If the verifier's answer lacks the parameter, the item shows the text of the answer.
   EXPECT_EQ(Why({"JAR_SIG_DUPLICATE_ZIP_ENTRY", {}, "twice"}),
             start + "twice (JAR_SIG_DUPLICATE_ZIP_ENTRY)");
 }

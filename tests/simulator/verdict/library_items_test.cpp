@@ -73,8 +73,8 @@ TEST(MakeReport, LibraryThatThePackageKeepsIsToldApart) {
             "lib/arm64/libfoo.so absent library-in-package");
 }
 
-// The tool's iteration ends at the damaged entry. Later libraries are not signed, even if they are
-// good.
+// The tool reads the entries in order and stops at the damaged entry. Later libraries are not
+// signed, even if they are good.
 TEST(MakeReport, LibraryBehindADamagedEntryIsRefusedIfItLiesThere) {
   const auto items = [](int error, bool is_strict) {
     PackageFacts facts =

@@ -93,8 +93,9 @@ TEST(MakeReport, IntegrityValuesAreReadAsTheToolReadsThem) {
   EXPECT_EQ(reason(nullptr), "package refused integrity-missing");
 }
 
-// The payload and the key are those that the kernel got with the package, or else with a library.
-// If the kernel got none, the key is the one that the tool's own code reads.
+// The report's payload and key are those that the kernel accepted for the package, or otherwise for
+// a library. If the kernel accepted none, the report has no payload, and its key is the one that
+// the tool's own code reads.
 TEST(MakeReport, KeyIsTheOneThatTheKernelGot) {
   const std::string own(64, 'a'), other(64, 'b');
   PackageFacts facts = WithLibraries({"lib/arm64-v8a/libfoo.so"});
@@ -117,7 +118,8 @@ TEST(MakeReport, KeyIsTheOneThatTheKernelGot) {
   EXPECT_EQ(told({Log(6, "Can't validate manifest.\n")}), "a 2048 not got ");
 }
 
-// Several answers for one file count, and so does an answer for a library without a path.
+// If the kernel answers several times for one file, each answer counts. An answer for a library
+// counts even if the library's path is not known.
 TEST(MakeReport, EachAnswerOfTheKernelCounts) {
   const std::string refused = "kernel-refused EPERM: Operation not permitted";
   EXPECT_EQ(Items({kFileStart, kTakesUp, Sign(kFile, kPackagePayload, EPERM),

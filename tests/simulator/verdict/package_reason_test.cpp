@@ -149,7 +149,8 @@ TEST(WhyRefused, OfASignature) {
   facts.jar.block.digest = "SHA512";
   facts.jar.block.has_known_digest = false;
   EXPECT_EQ(Why(errors, facts), "signature-digest SHA512");
-  // A digest algorithm that was not read does not count as unknown.
+  // If the block could not be read to its last signer, its digest algorithm does not count as
+  // unknown.
   facts.jar.block.is_whole = false;
   EXPECT_EQ(Why(errors, facts), "signature-wrong META-INF/CERT.RSA");
   facts.jar.block.has_pss = true;

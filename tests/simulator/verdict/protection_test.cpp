@@ -6,8 +6,9 @@ using namespace simulator;
 
 namespace {
 
-// A package with a dex file, two libraries, a resource, an entry that is not listed, and its
-// signature. Each entry has a different number of bytes.
+// A package with a dex file, two libraries, a resource, an entry that the manifest does not list,
+// and its signature. Each entry has a different number of bytes, so a sum shows which entries it
+// counts.
 PackageFacts Package() {
   PackageFacts facts;
   facts.jar.manifest = Archive::ReadResult::kRead;
@@ -45,7 +46,8 @@ Report With(const std::vector<Item>& items) {
   return report;
 }
 
-// "h" for a link that holds, "x" for the broken one, "-" for one that was not reached.
+// Returns one letter per link of the chain: "h" if the link holds, "x" if it is broken, "-" if it
+// was not reached.
 std::string ChainOf(const std::vector<Item>& items) {
   std::string text;
   for (const Link& link : MakeChain(Package(), With(items))) {

@@ -143,8 +143,8 @@ TEST(Warnings, OtherKeyOfAnyNewerSigner) {
   EXPECT_EQ(Warnings(facts), Lines({"other-key: the v2 " + told, "other-key: the v3 " + told}));
 }
 
-// A newer signer's key must have the modulus that the kernel gets. It must also be the key in the
-// JAR signer's certificate. Otherwise it is another key.
+// The key of a v2 or v3 signer must have the modulus that the kernel gets. It must also be the key
+// in the JAR signer's certificate. Otherwise the warning other-key reports it.
 TEST(Warnings, OtherKeyWithAPartOfTheJarSigners) {
   PackageFacts facts = Good();
   facts.newer = {{"v2", CertificateWith("CN=other", kModulus, "other key")}};
@@ -312,8 +312,8 @@ TEST(Warnings, DigestsForWhichCollisionsAreKnown) {
                                     "signature block is made with SHA1"}));
 }
 
-// The certificate has the JAR signer's key, but is another certificate. Phones use this
-// certificate.
+// The v2 signer's certificate has the JAR signer's key, but is another certificate. Phones use the
+// v2 signer's certificate.
 TEST(Warnings, CertificateOfANewerScheme) {
   PackageFacts facts = Good();
   NewerSignerFacts newer = {"v2", *facts.jar.certificate};
@@ -334,8 +334,8 @@ TEST(Warnings, CertificateOfANewerScheme) {
   EXPECT_EQ(Warnings(facts), Lines());
 }
 
-// date -u -d @1000000000: 2001-09-09 01:46:40. The certificate is still valid in the second that
-// notAfter names.
+// `date -u -d @1000000000` prints 2001-09-09 01:46:40. The certificate is still valid in the second
+// that notAfter names.
 TEST(Warnings, CertificateThatExpired) {
   const auto told = [](std::optional<int64_t> end, int64_t now) {
     PackageFacts facts = Good();
