@@ -135,7 +135,7 @@ void AddPhone(CLI::App* app, Options* options) {
   PhoneSettings* const phone = &options->run.phone;
   app->add_option_function<std::string>(
          "--integrity", [phone](const std::string& text) { phone->integrity = Split(text, ','); },
-         "The tool's integrity value, one TEXT a reading;\n"
+         "The tool's integrity value, one TEXT for each reading;\n"
          "the last one repeats, \"missing\" is no file\n"
          "[default: 1f]")
       ->type_name("TEXT[,TEXT]...");
@@ -294,7 +294,7 @@ void AddOutput(CLI::App* app, Options* options) {
   };
   document("--junit", &options->show.junit, "Write test results to FILE, in JUnit format");
   document("--sarif", &options->show.sarif, "Write results to FILE, as a SARIF 2.1.0 log");
-  document("--html", &options->show.html, "Write everything to FILE, a page for browsers");
+  document("--html", &options->show.html, "Write everything to FILE, as an HTML page");
 }
 
 void AddRun(CLI::App* app, Options* options, std::string* runner) {

@@ -135,7 +135,8 @@ void AddItems(const Report& report, data* file) {
                   {"cures", has_cure ? list{{"cure", Pieces(item.reason.cause->cure)}} : list()}};
   };
   const auto refused = static_cast<uint64_t>(std::count_if(items.begin(), items.end(), is_refused));
-  AddLines("items", items, Counted(refused, "is refused", "are refused") + " of all", make, file);
+  AddLines("items", items, Counted(refused, "of all items is refused", "of all items are refused"),
+           make, file);
 }
 
 void AddPicture(const Report& report, data* file) {
@@ -219,7 +220,7 @@ list FactRows(const Report& report, const PageRun& run) {
     rows.emplace_back("size (bytes)", Grouped(report.file_size));
     rows.emplace_back("SHA-256 digest", report.file_sha256);
   }
-  rows.emplace_back("looked at in the run of", TimeText(run.begun, "%Y-%m-%d %H:%M:%S UTC"));
+  rows.emplace_back("time of the run", TimeText(run.begun, "%Y-%m-%d %H:%M:%S UTC"));
   rows.emplace_back("tool", ToolText(run));
   rows.emplace_back("simulator", "apktoolkit-sim " APKTOOLKIT_VERSION);
   list shown;

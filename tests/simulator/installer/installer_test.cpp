@@ -108,7 +108,8 @@ TEST(InstallerProcess, IsEndedAndStartedAgainWhenTheTimeIsUp) {
   EXPECT_EQ(first.state, Judgement::State::kGaveUp);
   EXPECT_EQ(first.why, "it was still busy after 1.5 s");
   const std::string pid = ContentOf(java / "java.was");
-  EXPECT_NE(RunProcess({"bash", "-c", "kill -0 " + pid}).status, 0) << "the first has ended";
+  EXPECT_NE(RunProcess({"bash", "-c", "kill -0 " + pid}).status, 0)
+      << "the first process must have ended";
   EXPECT_EQ(installer.Judge(package.path()).state, Judgement::State::kJudged);
 }
 

@@ -157,7 +157,7 @@ TEST(Page, IsBoundedHoweverMuchThereIs) {
   report.events = ParseEvents(journal);
   const std::string page = PageOf(report);
   EXPECT_LT(page.size(), 2U << 20);
-  EXPECT_TRUE(Has(page, "<p class=\"more\">59,800 more; 1 is refused of all</p>"));
+  EXPECT_TRUE(Has(page, "<p class=\"more\">59,800 more; 1 of all items is refused</p>"));
   EXPECT_EQ(Count(page, "<p class=\"more\">59,800 more</p>"), 1U);
   EXPECT_TRUE(Has(page, "<p class=\"more\">59,800 more; the journal has them all</p>"));
   EXPECT_EQ(Count(page, "<li class=\"bad\"><span class=\"mark bad\""), 1U)
@@ -290,7 +290,7 @@ TEST(Page, SaysOfWhichRunAndProgramsItIs) {
        {std::string("<dt>path</dt><dd>/data/app/base.apk</dd>"),
         std::string("<dt>size (bytes)</dt><dd>1,234,567</dd>"),
         "<dt>SHA-256 digest</dt><dd>" + report.file_sha256 + "</dd>",
-        std::string("<dt>looked at in the run of</dt><dd>2026-11-22 09:08:07 UTC</dd>"),
+        std::string("<dt>time of the run</dt><dd>2026-11-22 09:08:07 UTC</dd>"),
         std::string("<dt>tool</dt><dd>apktoolkit " APKTOOLKIT_VERSION "</dd>"),
         std::string("<dt>simulator</dt><dd>apktoolkit-sim " APKTOOLKIT_VERSION "</dd>")}) {
     EXPECT_EQ(Count(page, row), 2U) << row;
