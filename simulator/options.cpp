@@ -135,7 +135,7 @@ void AddPhone(CLI::App* app, Options* options) {
   PhoneSettings* const phone = &options->run.phone;
   app->add_option_function<std::string>(
          "--integrity", [phone](const std::string& text) { phone->integrity = Split(text, ','); },
-         "The tool's integrity value, one TEXT for each reading;\n"
+         "The tool's integrity value, one TEXT per reading;\n"
          "the last one repeats, \"missing\" is no file\n"
          "[default: 1f]")
       ->type_name("TEXT[,TEXT]...");

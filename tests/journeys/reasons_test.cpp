@@ -254,8 +254,8 @@ TEST_F(Reason, TamperedDexFile) {
             Lines({"REFUSED  base.apk",
                    "  ✗ package                not signed: classes.dex is not the one that was "
                    "signed",
-                   "      Sign the package again, as the last step that changes it. If nobody",
-                   "      changed it: do not trust it.",
+                   "      Sign the package again, as the last step that changes it. If you did not",
+                   "      change it yourself, do not trust it.",
                    "  ✗ lib/arm64/libvault.so  not signed: the package is refused",
                    "  ✗ lib/arm/libvault.so    not signed: the package is refused",
                    "  ✗ key                    not registered: the package is refused", "-> 1"}));
@@ -388,8 +388,8 @@ TEST_F(Reason, Jar) {
   Do("echo text >a.txt; jar --create --file library.jar a.txt");
   EXPECT_EQ(Told(2, {}, "library.jar"),
             Lines({"NOT TRUSTED JAR  library.jar",
-                   "  ✗ JAR  not signed: it is a plain JAR, and those are signed only when the "
-                   "kernel trusts them already (ENOKEY: Required key not available)",
+                   "  ✗ JAR  not signed: it is a plain JAR, which is signed only if the kernel "
+                   "already trusts it (ENOKEY: Required key not available)",
                    "-> 1"}));
   EXPECT_EQ(Told(2, {"--trust", "library.jar"}, "library.jar"),
             Lines({"TRUSTED JAR  library.jar", "  ✓ JAR  signed, without data", "-> 0"}));

@@ -96,7 +96,7 @@ TEST(VerdictEvent, HoldsTheWholeReport) {
       {"kind": "library", "name": "lib/x86/a.so", "entry": "lib/x86/a.so",
        "state": "nothing-to-sign", "reason": "library-other-abi",
        "text": "the tool knows no directory for its ABI",
-       "cure": "Nothing to do: the tool knows no directory for its ABI."},
+       "cure": "Nothing to do."},
       {"kind": "key", "name": "com.app", "state": "registered"}],
     "warnings": [{"reason": "signing-block-damaged",
                   "text": "its signing block (v2 and later) is damaged",
