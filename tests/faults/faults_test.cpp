@@ -59,8 +59,8 @@ class Installed {
   struct Outcome {
     ToolEnd ending;
     bool failed;  // the call that must fail was made
-    // What the kernel signed and libzu registered, in order, one letter each. L: the library. P:
-    // the package. J: a JAR. K: the package's key. N: the key under an empty name. ?: anything
+    // The kernel's signatures and libzu's registrations in order, one letter each. L: the library.
+    // P: the package. J: a JAR. K: the package's key. N: this key under an empty name. ?: anything
     // else.
     std::string grants;
     std::string errors;
