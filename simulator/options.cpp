@@ -169,8 +169,8 @@ void AddKernelAnswer(CLI::App* app, const char* name, int* error, const char* de
 void AddFiles(CLI::App* app, Options* options) {
   FileListOptions* const files = &options->files;
   app->add_flag("--recursive", files->is_recursive,
-                "Look at the packages in and below a directory:\n.apk .jar .apks .xapk .apkm "
-                ".aab");
+                "Look at the packages in and below a directory:\n"
+                ".apk .jar .apks .xapk .apkm .aab");
   CLI::Option* const list = app->add_option("--files-from", files->list,
                                             "Read more FILEs from a list, one a line;\n"
                                             "\"-\" is standard input")
@@ -316,8 +316,8 @@ void AddRun(CLI::App* app, Options* options, std::string* runner) {
                   "beside this program]")
       ->type_name("PATH");
   app->add_option("--runner", *runner,
-                  "Put these words before the tool: an emulator\nthat accepts -E NAME=VALUE "
-                  "[default: none]")
+                  "Put these words before the tool: an emulator\n"
+                  "that accepts -E NAME=VALUE [default: none]")
       ->type_name("COMMAND")
       ->take_last();
 }

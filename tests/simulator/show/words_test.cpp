@@ -91,8 +91,7 @@ TEST(HeadFacts, SoundTheAlarmsAndNoOtherWarnings) {
   Report report;
   report.warnings = {{&cause::kUnlistedEntries, "x"}, {&cause::kBlockAmbiguous, "why"}};
   EXPECT_EQ(HeadFacts(report, "..."),
-            Lines({"! other programs may find a different signer in its signature block: "
-                   "why",
+            Lines({"! other programs may find a different signer in its signature block: why",
                    "2 warnings"}));
   report.warnings.erase(report.warnings.begin());
   EXPECT_EQ(HeadFacts(report, "...").back(), "1 warning");
