@@ -1,7 +1,7 @@
 #!/usr/bin/env python3
 """Compiles integration/sepolicy with stand-ins for the platform's policy, for each API level in
 LEVELS. The policy must grant exactly the permissions that are listed below. file_contexts must be
-valid, and exactly one of its patterns must match each program of the kit.
+valid, exactly one of its patterns must match each program of the kit, and each pattern a program.
 
 m4, checkpolicy, secilc and setfiles are Debian's. The compilation must fail with each rule of
 REFUSED.
@@ -158,12 +158,20 @@ def check(directory, level):
 
 
 def check_names():
-    """Checks that each program of the kit matches exactly one pattern of file_contexts."""
-    programs = {"apktoolkit", "apktoolkit-all", "apktoolkit-bound", "apktoolkit-verify"}
+    """Checks that each program of the kit matches exactly one pattern of file_contexts, and that
+    each pattern matches a program."""
+    programs = ["apktoolkit", "apktoolkit-all", "apktoolkit-bound", "apktoolkit-verify"]
     patterns = [line.split()[0] for line in (KIT / "file_contexts").read_text().splitlines()
                 if line and not line.startswith("#")]
-    return [f"/system/bin/{name} has {count} labels" for name in sorted(programs)
-            if (count := sum(bool(re.fullmatch(p, f"/system/bin/{name}")) for p in patterns)) != 1]
+    problems = []
+    for name in programs:
+        count = sum(bool(re.fullmatch(p, f"/system/bin/{name}")) for p in patterns)
+        if count != 1:
+            problems.append(f"/system/bin/{name} has {count} labels")
+    for pattern in patterns:
+        if not any(re.fullmatch(pattern, f"/system/bin/{name}") for name in programs):
+            problems.append(f"file_contexts: {pattern} matches no program of the kit")
+    return problems
 
 
 def main():
