@@ -1,4 +1,4 @@
-// Init, and the steps that verify a package.
+// Init, and the order of the steps that verify a package.
 #include "apk/apk.h"
 
 #include <utility>

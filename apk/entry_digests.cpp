@@ -7,8 +7,8 @@ namespace ApkTools {
 
 namespace {
 
-// The name and the value of the section's digest attribute; two empty texts if it has none. If it
-// has several, the last one in byte order counts.
+// The name and the value of the section's digest attribute. If the section has several, the last
+// name in byte order counts. If it has none, both texts are empty.
 ManifestMf::Section::value_type DigestOf(const ManifestMf::Section& section) {
   return section.findLastEndingIn("-Digest");
 }

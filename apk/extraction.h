@@ -24,9 +24,10 @@ inline constexpr uint32_t kZipTrustedLength = 64 << 20;
 bool IsPlausibleLength(const ZipEntry& entry);
 
 // Extracts the whole entry into `out`, which then has the entry's length. If the declared length is
-// impossible, returns kZipInconsistentInformation and leaves `out` unchanged. Above
-// kZipTrustedLength, `out` also stays unchanged if the data has another length (the library's
-// code), or if the entry does not fit in memory (kZipAllocationFailed).
+// impossible, returns kZipInconsistentInformation and leaves `out` unchanged. If the entry is
+// longer than kZipTrustedLength, `out` also stays unchanged in two cases: the data has another
+// length (returns the library's code), or the entry does not fit in memory (returns
+// kZipAllocationFailed).
 int32_t ExtractZipEntry(ZipArchiveHandle archive, ZipEntry* entry, std::vector<uint8_t>& out);
 
 }  // namespace ApkTools

@@ -22,7 +22,8 @@ bool IsPlainText(const uint8_t* eight) {
   uint64_t bytes;
   memcpy(&bytes, eight, sizeof(bytes));
   // Setting the high bit of each byte prevents a borrow from the next byte. The subtraction clears
-  // that bit only if the byte's low seven bits are less than the least plain byte.
+  // that bit only if the byte's low seven bits are less than the least plain byte. A byte whose own
+  // high bit is set is always plain: `| bytes` sets the bit again.
   return ((((bytes | kHighBits) - kLeastPlain) | bytes) & kHighBits) == kHighBits;
 }
 
@@ -38,7 +39,7 @@ class Parser {
       : text_(text.data()), size_(text.size()), sections_(sections) {}
 
   // Deliberate: an attribute or section that is still open at the end of the text is dropped. Only
-  // an empty line ends a section. Signing tools write one even after the last section.
+  // an empty line ends a section. Signing tools write an empty line even after the last section.
   bool parse() {
     while (cursor_ < size_) {
       if (!isExpectedState() || !step()) return false;

@@ -56,11 +56,10 @@ void ManifestSections::reset(const uint8_t* text, size_t size) {
   patience_ = kLittleText;
 }
 
-// Sorting a section drops repeated names. After each sort, the next sort waits for kLittleText more
-// bytes of text. For each name that the section then has, it also waits for the name's length and
-// kTwoAttributes. kTwoAttributes is the length of the text of two short attributes. Because of the
-// sorts, repeated names cannot fill the table. Because of the wait, long names are not compared
-// again after every few bytes.
+// From time to time, sorts the open section, which drops repeated names. Otherwise repeated names
+// could fill the table. Each sort compares all names of the section, so the next sort waits for
+// more text: kLittleText bytes, and for each name its length and kTwoAttributes bytes.
+// kTwoAttributes is the length of two short attributes, such as "A: b", with their line ends.
 void ManifestSections::add(const ManifestAttribute& attribute) {
   constexpr size_t kTwoAttributes = 10;
   attributes_.push_back(attribute);

@@ -1,5 +1,5 @@
 // The sections of a manifest, as one flat table. An attribute is two pieces of a text that the
-// caller owns; a section is a run of attributes. No string is copied, and nothing is logged.
+// caller owns; a section is a sequence of attributes. No string is copied, and nothing is logged.
 #pragma once
 
 #include <cstddef>
@@ -9,8 +9,8 @@
 #include <utility>
 #include <vector>
 
-// A piece of the text, in bytes from its start. 32 bits are enough for any entry of an archive, and
-// they keep the table small: a large manifest has several hundred thousand pieces.
+// A piece of the text: its offset and its length, in bytes. 32 bits are enough for any entry of an
+// archive, and they keep the table small: a large manifest has several hundred thousand pieces.
 struct ManifestPiece {
   uint32_t start = 0;
   uint32_t length = 0;

@@ -13,8 +13,8 @@ struct LibraryDirectory {
   const char* installed;          // where the installer puts those libraries, beside the package
 };
 
-// The first row whose prefix matches wins. The row "lib/armeabi" is therefore the last: its prefix
-// also matches the names of two other rows.
+// The first row whose prefix matches wins. The row "lib/armeabi" is the last, because its prefix
+// also matches every name that starts with "lib/armeabi-v7a" or "lib/armeabi-v8a".
 // Deliberate: "lib/armeabi-v8a" is not a standard ABI directory. Packages that use it mean 64-bit
 // Arm.
 inline constexpr LibraryDirectory kLibraryDirectories[] = {

@@ -36,8 +36,8 @@ using ZipName = decltype(ZipNameFor(static_cast<ZipEntry*>(nullptr)));
 // own.
 
 inline void SetZipName(std::string_view& name, const std::string& text) { name = text; }
-// Sets the fields one by one: the constructor from a C string would stop at a NUL and abort on a
-// long name.
+// Sets the fields one by one, because the constructor of `ZipString` from a C string would stop at
+// a NUL and abort on a long name.
 template <typename Name>
 void SetZipName(Name& name, const std::string& text) {
   name.name = reinterpret_cast<const uint8_t*>(text.data());

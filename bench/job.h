@@ -39,8 +39,8 @@ std::string SignatureFileName(const GivenPackage& package);
 std::string WalkManifest(const Buffer& compiled_manifest);
 
 // Does three things for each library beside the package: reads the whole file, calls `check` with
-// the entry's name and the file's bytes, and tries to sign the file. On a workstation, this fails
-// as in the tool.
+// the entry's name and the file's bytes, and writes the log lines of a failed signature. The tool
+// cannot sign on a workstation either, and writes the same lines.
 using CheckLibrary = std::function<void(const std::string& name, const Buffer& content)>;
 void SignLibraries(const GivenPackage& package, const CheckLibrary& check);
 void SignGiven(const GivenPackage& package);

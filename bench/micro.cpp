@@ -57,8 +57,8 @@ void MontMul(benchmark::State& state) {
 }
 BENCHMARK(MontMul)->Name("mpi_montmul")->Arg(1024)->Arg(2048)->Arg(4096);
 
-// Computes R^2 mod N, where R is 2^32 to the power of the number of limbs of N. A public operation
-// of RSA has no other long division.
+// Computes R^2 mod N, where R is 2^32 to the power of the number of limbs of N. This is the only
+// long division in a public operation of RSA.
 void ModMpi(benchmark::State& state) {
   Operands operands(KeyOf(state));
   mpi_local power, remainder;

@@ -1,6 +1,6 @@
-"""bench/report.py BUILD-DIRECTORY: measures the tool, the floor (bench_floor) and the peer
-(bench_peer), prints the tables, and writes the numbers and plots of docs/performance.md.
-scripts/bench calls it."""
+"""bench/report.py BUILD-DIRECTORY: measures the tool and two programs that do the same job: the
+floor (bench_floor) without the verification, and the peer (bench_peer) with OpenSSL. Prints the
+tables, and writes the numbers and plots of docs/performance.md. scripts/bench calls this script."""
 
 import collections
 import datetime
@@ -86,7 +86,7 @@ def measure(package):
 
 def expect_same_log(package):
     """Exits unless the three programs wrote the same log, and this log has VeltSign's result 65536.
-    It is a failure, because the kernel of a workstation has no integrity feature."""
+    This result means failure: the kernel of a workstation has no integrity feature."""
     logs = {re.sub(r'\d\d-\d\d \d\d:\d\d:\d\d +\d+ +\d+', '', subprocess.run(
         [program, package_path(package.name)], check=True, capture_output=True, text=True).stderr)
         for program in (TOOL, FLOOR, PEER)}
@@ -142,7 +142,7 @@ def growth(runs, start_up):
 
 def measure_outside(package):
     """The wall-clock seconds of apksigner and jarsigner. Each runs twice, and the shorter run
-    counts. These programs check every entry."""
+    counts. Unlike the tool, these programs check every entry."""
     commands = (['apksigner', 'verify', '--min-sdk-version', '18', '--max-sdk-version', '23'],
                 ['jarsigner', '-verify'])
     times = []

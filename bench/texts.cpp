@@ -79,7 +79,8 @@ constexpr Text kTexts[] = {
     {"one name without end", [] { return Repeat([](size_t) { return "A"; }); }},
 };
 
-// With these numbers, documents deflate to a thousandth of their size.
+// With these numbers, documents deflate to a thousandth of their size, so that a small package can
+// contain them.
 constexpr size_t kManyNodes = 1 << 20;
 constexpr size_t kLongName = 30000;
 

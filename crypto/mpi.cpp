@@ -12,8 +12,8 @@
 // Deliberate: limbs have 32 bits, and every sum and product of limbs is computed in 32 bits, even
 // on 64-bit processors. All processors compute in the same way, in half limbs, and the compiler
 // needs no double-width type. The object code for the device has no wider multiplication either
-// (scripts/check android checks this). Other compilers may use a wider multiplication for a vector
-// of half limbs, as gcc does for x86-64.
+// (scripts/check android checks this). For another processor, a compiler may use a wider
+// multiplication for a vector of half limbs, as gcc does for x86-64.
 
 namespace {
 
@@ -217,8 +217,8 @@ WRAPS_ON_PURPOSE void mpi_montmul(mpi* A, const mpi* B, const mpi* N, unsigned i
     const uint32_t u1 = (d[0] + u0 * B->p[0]) * mm;
     mpi_mul_hlp(m, B->p, d, u0);
     mpi_mul_hlp(n, N->p, d, u1);
-    // The two products made this limb of T zero. The limb is not part of the result, so it can
-    // store another value.
+    // The choice of u1 made this limb of T zero. The limb is not part of the result, so storing u0
+    // in it does not change the result.
     *d++ = u0;
   }
   for (int i = 0; i <= n; ++i) A->p[i] = d[i];
@@ -341,8 +341,8 @@ WRAPS_ON_PURPOSE int reduce(mpi* X, const mpi* B) {
   mpi_local Y;
   mpi_local product;
   if (const int result = mpi_assign(&Y, B)) return result;
-  // The estimate of a digit is close and never too small if the top limb of the divisor has its
-  // highest bit set.
+  // Shifts both numbers left until the top limb of the divisor has its highest bit set. The
+  // estimate of a quotient digit is then close and never too small.
   const int shift = (kMpiLimbBits - mpi_msb(&Y) % kMpiLimbBits) % kMpiLimbBits;
   if (const int result = mpi_shift_l(&Y, shift)) return result;
   if (const int result = mpi_shift_l(X, shift)) return result;

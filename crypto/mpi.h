@@ -35,8 +35,8 @@ void mpi_init(mpi* X, ...) __attribute__((sentinel));
 // allowed. The list ends with a null pointer.
 void mpi_free(mpi* X, ...) __attribute__((sentinel));
 
-// Calls mpi_init or mpi_free for all numbers of a record. In this overload, the record is a single
-// number.
+// Calls mpi_init or mpi_free for all numbers of a record. Each type of record has its overload.
+// This one is for a record that is a single number.
 inline void mpi_apply(void (*call)(mpi* X, ...), mpi* X) { call(X, nullptr); }
 
 // A record whose numbers start empty and are released when its scope ends.
@@ -102,6 +102,7 @@ int mpi_mod_mpi(mpi* R, const mpi* A, const mpi* B);
 // not matter. A must have at least N.n + 1 limbs, B at least one, and T at least 2 * (N.n + 1).
 void mpi_montmul(mpi* A, const mpi* B, const mpi* N, unsigned int mm, mpi* T);
 
-// X = A^abs(E) mod N, for A >= 0 and N of fewer than 2^25 limbs. X may be A, but neither E nor N.
-// Returns kMpiBadModulus, with X unchanged, if N is negative or even.
+// X = A^abs(E) mod N, for A >= 0 and N of fewer than 2^25 limbs. The calculation uses the number
+// 2^(64 * N.n), which must be shorter than 2^31 bits. X may be A, but neither E nor N. Returns
+// kMpiBadModulus, with X unchanged, if N is negative or even.
 int mpi_pow_mod(mpi* X, const mpi* A, const mpi* E, const mpi* N);

@@ -74,8 +74,8 @@ bool Block::ReadInside(size_t offset, size_t end, asn1_hdr* hdr) const {
 }
 
 // Reads the headers from the start of the block to the [0] of the certificates. Leaves the last
-// header in `hdr`. Deliberate: no tag is checked. Each length is compared with the length of the
-// whole block, counted from the element's own position.
+// header in `hdr`. Deliberate: no tag is checked. Each element may be as long as the whole block,
+// counted from the element's own start, and may therefore end beyond the block.
 WRAPS_ON_PURPOSE bool ReadHeaders(const Block& block, asn1_hdr* hdr) {
   if (!block.Read(0, block.length, hdr) || !block.Read(block.Enter(*hdr), block.length, hdr)) {
     return Fail("CANT PROCESS CERTIFICATE TAG");
@@ -183,7 +183,7 @@ bool ReadSigner(const Block& block, const asn1_hdr& certificates, pkcs7* record)
 }
 
 // Reads the AlgorithmIdentifier at `offset`, which must end at or before `end`. It may name any
-// algorithm, because the signature itself names its digest algorithm.
+// algorithm, because the tool uses the digest algorithm that the signature itself names.
 bool ReadDigestAlgorithm(const Block& block, size_t offset, size_t end, asn1_hdr* algorithm) {
   asn1_oid oid;
   const uint8_t* next;

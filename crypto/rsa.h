@@ -1,8 +1,8 @@
 // RSA PKCS#1 v1.5 signature verification (RFC 8017 §8.2.2) with the integers of crypto/mpi.h.
 //
 // A context owns the limbs of its two numbers; an rsa_local releases them. No pointer to the
-// caller's bytes is kept after a call. A refused DigestInfo is logged at error priority, except a
-// DigestInfo of MD5's length with another prefix. Every other refusal is silent.
+// caller's bytes is kept after a call. A refused DigestInfo is logged at error priority, unless it
+// has the length of an MD5 DigestInfo and another prefix. No other refusal is logged.
 #pragma once
 
 #include <cstdint>
@@ -29,8 +29,8 @@ inline constexpr uint32_t kRsaMaxModulusSize = 512;
 
 // True if anyone can forge signatures for a key with this exponent. The caller must refuse these
 // keys. Deliberate: only 1 and -1 are refused. The arithmetic ignores the exponent's sign
-// (mpi_pow_mod). A number to the power of 1 is itself, so anyone could write a valid signature for
-// any modulus (docs/decisions/exponent-of-one.md).
+// (mpi_pow_mod). A number to the power of 1 is itself, so the encoded message would be its own
+// signature. Anyone can write this message (docs/decisions/exponent-of-one.md).
 constexpr bool rsa_is_forgeable(uint32_t exponent_value) {
   return exponent_value == 1 || exponent_value == UINT32_MAX;
 }
@@ -45,10 +45,10 @@ inline constexpr int kRsaPublicFlag = 16;
 // Loads a public key into `ctx`, which must not be null. Limbs that `ctx` owned before are not
 // freed.
 //
-// `modulus` is unsigned, big-endian, and has `len` bytes. If it is null, both numbers stay empty.
-// `exponent` has the same form and length. If `exponent` is null, the exponent is `exponent_value`,
-// read as a signed number. A `len` of 0 leaves both numbers empty and does not change the context's
-// `len`. A context with an empty modulus verifies nothing.
+// `modulus` is unsigned, big-endian, and has `len` bytes. If it is null, both numbers are empty
+// afterwards. `exponent` has the same form and length. If `exponent` is null, the exponent is
+// `exponent_value`, read as a signed number. A `len` of 0 leaves both numbers empty and does not
+// change the context's `len`. A context with an empty modulus verifies nothing.
 //
 // Returns 0, or kRsaKeyFlag | kMpiNoMemory (9) with both numbers empty. If memory runs out only for
 // `exponent_value`, returns 0 and leaves the exponent empty: the key then verifies nothing.

@@ -1,9 +1,9 @@
 // Marks arithmetic that wraps on purpose.
 #pragma once
 
-// Declares that unsigned arithmetic in a function may wrap. The function handles carries itself, or
-// needs the wrapped value. scripts/check fails for an unsigned overflow in any other function of
-// the tool. The mark has no other effect.
+// Marks a function whose unsigned arithmetic may wrap. The function handles carries itself, or
+// needs the wrapped value. An unsigned overflow in any other function of the tool ends the test or
+// the fuzz target (scripts/check). The mark has no other effect.
 #ifdef __clang__
 #define WRAPS_ON_PURPOSE __attribute__((no_sanitize("unsigned-integer-overflow")))
 #else

@@ -5,7 +5,8 @@
 
 namespace {
 
-// The unread bytes of an element. Deliberate: bytes after the last known element are ignored.
+// The bytes of an element that are not read yet. Deliberate: bytes after the last element that the
+// parser looks for are ignored.
 struct Range {
   const uint8_t* start;
   size_t length;
@@ -13,7 +14,8 @@ struct Range {
 
 Range Contents(const asn1_hdr& hdr) { return {hdr.payload, hdr.length}; }
 
-// Returns the part of `range` from `position` to the end. `position` must be in `range`.
+// Returns the part of `range` from `position` to the end. `position` must be in `range` or at its
+// end.
 Range After(const Range& range, const uint8_t* position) {
   return {position, range.length - static_cast<size_t>(position - range.start)};
 }
@@ -334,8 +336,8 @@ bool ReadExtensionValue(Range extension, bool* critical, Range* value) {
     *critical = hdr.payload[0] != 0;
     // Deliberate: the next header is read from the flag's value byte, not from the byte after it.
     // TRUE in DER is 0xFF. This byte reads as the first octet of a long-form tag of the private
-    // class. The identifier octet of the OCTET STRING then reads as the tag number. A FALSE that is
-    // written out, although DER omits it, is refused.
+    // class. The identifier octet of the OCTET STRING then reads as the tag number. FALSE is 0x00,
+    // which reads as tag 0. An extension with a FALSE, which DER omits, is therefore refused.
     extension = After(from_flag, hdr.payload);
     if (!Next(&extension, &hdr)) return false;
     if (hdr.class_ != kAsn1Universal && hdr.class_ != kAsn1Private) return false;

@@ -1,5 +1,5 @@
-// apk/base64.h: decodes any text into a buffer of any size. A second decoder, which first collects
-// all bits, must agree.
+// apk/base64.h: decodes any text into a buffer of 0 to 63 bytes. A second decoder, which first
+// collects all bits, must agree.
 #include "apk/base64.h"
 
 #include "fuzz/fuzz.h"

@@ -1,7 +1,7 @@
 // apk/android_manifest.cpp: any bytes as the compiled Android manifest. The sanitizers do not check
 // the platform's parser. The tool's buffer for the bytes therefore ends right before memory that
-// cannot be read. A second reader converts texts to UTF-8 before it compares them. Both readers
-// must find the same facts.
+// cannot be read. The tool compares texts without conversion. A second reader, in this file,
+// converts texts to UTF-8 before it compares them. Both readers must find the same facts.
 #include <androidfw/ResourceTypes.h>
 #include <utils/String8.h>
 

@@ -1,4 +1,5 @@
-// apk/manifest_mf.h: parses any text. A second reader must return the same result.
+// apk/manifest_mf.h: parses any text. A second parser (ReadManifest in fuzz/models.h) must return
+// the same result.
 #include "apk/manifest_mf.h"
 
 #include <map>

@@ -1,6 +1,7 @@
 // Runs the whole tool, from main() on, with any bytes as the package file. The phone is simulated
-// inside this program (support/phone.h). The first byte of the input selects the phone. A model
-// (package_model.h) reads the same bytes, and must allow every signature and registration. The peak
+// inside this program (support/phone.h). The first byte of the input sets the phone's answers, and
+// whether an attacker exchanges libraries. The other bytes are the package file. A model
+// (package_model.h) reads the same file, and must allow every signature and registration. The peak
 // memory has a limit, and no descriptor may stay open.
 #include <dirent.h>
 #include <fcntl.h>
@@ -132,7 +133,7 @@ class Judge {
     while (words >> last) {
     }
     const bool is_package_file = PathOf(fd) == TheInstallation().package();
-    if (what == "verify") Require(is_package_file, "the kernel is asked about the file itself");
+    if (what == "verify") Require(is_package_file, "the kernel is asked only about the input file");
     if (what == "sign") JudgeSigning(fd, last, is_package_file);
     if (what == "register") JudgeRegistration(last, is_package_file);
     is_measured = true;
@@ -143,7 +144,7 @@ class Judge {
     if (payload == "0000") {
       Require(!model_->is_package(), "the empty payload is for files that are not packages");
       Require(is_package_file && phone_.verify_errno == 0,
-              "the empty payload is only for a trusted file itself");
+              "the empty payload is only for a trusted input file");
       return;
     }
     Require(payload == "2000" + Hex(DigestOf(Digest::kSha256, model_->key())),
@@ -156,7 +157,7 @@ class Judge {
   }
 
   void JudgeRegistration(const std::string& data, bool is_package_file) {
-    Require(is_package_file, "a registration is for the file itself");
+    Require(is_package_file, "only the input file is registered");
     if (model_->is_package()) {
       Require(model_->is_good(), "a package is registered only if it is good");
       Require(data == Hex(model_->key()), "a package registers its signer's key");

@@ -32,7 +32,7 @@ struct PackageModel::Archive {
   Archive& operator=(const Archive&) = delete;
 
   // Returns 1 if the archive has the entry, 0 if it does not or is not open, and -1 on any other
-  // error.
+  // error. The zip library's code for an entry that is not found is -7.
   int Find(const std::string& name, ZipEntry* entry) const {
     const int result = handle == nullptr ? -7 : FindEntry(handle, std::string_view(name), entry);
     return result == -7 ? 0 : result == 0 ? 1 : -1;
@@ -166,6 +166,7 @@ size_t DeclaredBytes(const Bytes& bytes) {
     ZipEntry entry;
     std::string name;
     while (Next(cookie, &entry, &name) == 0) {
+      // Deflate makes at most 1032 bytes from one byte.
       if (entry.uncompressed_length > uint64_t{1032} * entry.compressed_length) continue;
       // The platform's library keeps up to 64 KiB for 40 bytes of a compiled manifest. For each
       // byte, this is less than 128 * kBytesPerByte (package_fuzz.cpp).

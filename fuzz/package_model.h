@@ -49,6 +49,8 @@ class PackageModel {
   std::map<std::string, Listed> listed_;
 };
 
-// The sum of the sizes that the archive's entries declare. "AndroidManifest.xml" counts 128 times.
-// An entry is left out if deflate cannot make the declared size from the entry's data.
+// The sum of the sizes that the archive's entries declare. "AndroidManifest.xml" counts 128 times,
+// because the platform's library can use far more memory than this entry has bytes. An entry is
+// left out if deflate cannot make the declared size from the entry's data: the tool does not
+// extract it.
 size_t DeclaredBytes(const Bytes& archive);

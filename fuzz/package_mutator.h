@@ -6,6 +6,6 @@
 #include <cstddef>
 #include <cstdint>
 
-// An LLVMFuzzerCustomMutator. The first byte of the data selects the phone; the rest is the
-// archive.
+// An LLVMFuzzerCustomMutator. The first byte of the data selects the state of the simulated phone;
+// the rest is the archive.
 size_t MutatePackage(uint8_t* data, size_t size, size_t max_size, unsigned seed);

@@ -1,5 +1,6 @@
 // crypto/pkcs7.h and ApkTools::Apk::VerifyCertificate: any bytes as the signature block of one
-// fixed signature file. About half of the mutations are signed again (SignAgain).
+// fixed signature file. About half of the mutations are signed again (SignAgain), so that the
+// signature checks do not stop them.
 #include <cstring>
 #include <random>
 

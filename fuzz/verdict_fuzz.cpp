@@ -225,10 +225,10 @@ void JudgeShown(const Report& report) {
   Require(digest.empty() || head.compare(key + 6, 8, digest, 0, 8) == 0, "this key is shown");
   const bool is_got = all.str().find("what the kernel got") != std::string::npos;
   Require(is_got == (report.key && report.key->was_got),
-          "the text says that the kernel got the key only if it did");
+          "the text says whether the kernel got the key");
   const bool is_alarmed = HasWarning(report, cause::kCertificateOtherKey);
   Require(!is_alarmed || head.find("   ! ") != std::string::npos,
-          "an alarm is in the verdict's line");
+          "the warning about another key is in the verdict's line");
 
   const json event = json::parse(VerdictEvent(report));
   Require(event["payload"] == report.payload, "the event has the payload");

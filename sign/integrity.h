@@ -2,7 +2,7 @@
 // that the kernel publishes for each task under /proc. C linkage. The functions log nothing and
 // leave errno as the last system call set it. They keep no state, and any thread may call them.
 //
-// All three return 0 for success and kVeltFailure for every failure.
+// All three functions return 0 for success and kVeltFailure for every failure.
 #pragma once
 
 #include <cstdint>
@@ -29,8 +29,8 @@ uint32_t VeltVerifyFd(int fd);
 //
 // If bit 0 of `wait` is set, reads again every 10 ms while the value is 0xFFFFFFFF (not settled
 // yet), and stores each value in `*value`. Fails if `value` is null, if `pid` is negative, or if
-// the task's file cannot be opened or does not begin with a hexadecimal number. After a failure,
-// `*value` has its former value, or the last value that was read while waiting.
+// the task's file under /proc cannot be opened or does not begin with a hexadecimal number. After a
+// failure, `*value` has its former value, or the last value that was read while waiting.
 uint32_t VeltTaskReadIntegrity(int pid, uint32_t wait, uint32_t* value);
 
 }  // extern "C"

@@ -32,9 +32,9 @@ bool IsSameFile(const struct stat& before, const struct stat& after) {
 int OpenForReading(const char* path, int flags) {
   const int fd = open(path, O_RDONLY | O_NONBLOCK | flags);
   if (fd >= 0 || errno != EWOULDBLOCK) return fd;
-  // Another process holds a lease, and open must now wait for its end. Meanwhile the holder could
-  // put a FIFO in the file's place, and open would wait for a writer. An O_PATH descriptor
-  // therefore pins the file first, and the file is opened through it.
+  // Another process holds a lease on the file. Without O_NONBLOCK, open waits until the lease ends.
+  // Meanwhile the holder could put a FIFO at the path, and open would then wait for a writer. The
+  // file is therefore not opened by its path again, but through an O_PATH descriptor.
   const ScopedFd pinned(open(path, O_PATH | O_CLOEXEC));
   struct stat state = {};
   if (pinned.get() < 0 || fstat(pinned.get(), &state) != 0 || !S_ISREG(state.st_mode)) return -1;
@@ -57,7 +57,8 @@ bool ReadFile(const std::string& path, std::vector<uint8_t>& out, struct stat* s
   if (out.empty() && out.capacity() < static_cast<size_t>(size)) std::vector<uint8_t>().swap(out);
   out.resize(static_cast<size_t>(size));
   // Deliberate: reading succeeds even if the file shrinks meanwhile. The end of `out` then keeps
-  // its old bytes. Every caller computes the digest of `out`, and that digest then does not match.
+  // its old bytes. Every caller compares the digest of `out` with the manifest's digest. With the
+  // old bytes, these two digests differ.
   ReadBytes(fd, out);
   if (state != nullptr) *state = found;
   return true;

@@ -1,7 +1,8 @@
 // apktoolkit-all DIRECTORY LIST: signs every installed package after an update of the system. The
 // file LIST has a line "DIGEST[,DIGEST]... PATH" for each package. The digests name the signers
-// that the package manager knows (SignerDigests.java). DIRECTORY contains the programs, for example
-// /system/bin. The program prints the outcome for each package.
+// that the package manager knows (SignerDigests.java). DIRECTORY contains apktoolkit,
+// apktoolkit-bound and apktoolkit-verify, for example /system/bin. The program prints the outcome
+// for each package.
 //
 // Files that the kernel already trusts are left out, so an interrupted run can be started again.
 // Exit status: 0 if all packages are trusted, 1 if some are not, 2 if the command line is wrong,
@@ -32,7 +33,8 @@ bool ReadLine(FILE* list, std::string* line) {
   return length > 0;
 }
 
-// The list of signers may be empty. The path is absolute and may contain blanks.
+// The part before the first blank, the digests, may be empty. The path is absolute and may contain
+// blanks.
 bool Parse(const std::string& line, InstalledPackage* package) {
   const size_t blank = line.find(' ');
   if (blank == std::string::npos || line.compare(blank, 2, " /") != 0) return false;

@@ -12,8 +12,8 @@
 
 namespace {
 
-// The exit status of a child that could not set its memory limit or exec the program. The kit's
-// programs use lower numbers.
+// The exit status of a child that could not set its memory limit or exec the program. The tool,
+// apktoolkit-verify and apktoolkit-bound use lower numbers.
 constexpr int kCannotBecome = 127;
 
 // Everything that the child needs. It is made before the fork, because the child must not allocate

@@ -5,7 +5,8 @@
 // are beside it. It must be called before any code of the package is run, mapped, or compiled ahead
 // of time (dexopt). From the call on, nobody may write to the package or beside it. The caller must
 // not hold a lock: the call may take as long as the limits allow. After an update of the system,
-// which may bring another key, SignPackage must be called for every installed package (main.cpp).
+// the kernel may no longer trust files that it signed before. SignPackage must therefore be called
+// for every installed package (main.cpp).
 #pragma once
 
 #include <string>
@@ -34,8 +35,9 @@ enum class SignOutcome {
 //
 // The product decides how to react. It should treat an untrusted package like a package for which
 // the kernel has no payload (the digest of the signer's key). After kTimedOut and kOutOfMemory the
-// libraries may be signed. The package itself is not, because it is signed last. Do not try again
-// at once: the same file takes the same time.
+// libraries may be signed, because apktoolkit signs them first. The package itself is not trusted:
+// if it were, the result would be kTrusted. Do not try again at once: the same file takes the same
+// time.
 SignOutcome SignPackage(const std::string& directory, const InstalledPackage& package,
                         const RunLimits& limits);
 

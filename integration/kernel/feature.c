@@ -49,7 +49,7 @@ static int verify_errno = ENOKEY;
 module_param(verify_errno, int, 0644);
 MODULE_PARM_DESC(verify_errno, "errno for a file that is not trusted");
 
-/* ---- The two commands. Functions return 0 or a negative error number. */
+/* ---- The two commands. A result of type int is 0 or a negative error number. */
 
 /* False if there is no file, or if the descriptor only names a file (O_PATH). */
 static bool is_open(const struct file *file)

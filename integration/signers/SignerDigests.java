@@ -29,8 +29,9 @@ public final class SignerDigests {
     /**
      * Returns the digests of the current signers of an installed package. Needs API level 28 or
      * later ({@code PackageManager.GET_SIGNING_CERTIFICATES}). If the key was rotated, earlier keys
-     * are left out on purpose. Somebody else may have a retired key, and apktoolkit passes only a
-     * digest of the key to the kernel, not the name of the package.
+     * are left out on purpose, because somebody else may have a retired key. apktoolkit passes only
+     * a digest of the key to the kernel, not the name of the package. The kernel could therefore
+     * not distinguish that person's packages from the owner's.
      */
     public static String of(SigningInfo info) throws CertificateException {
         return of(info.getApkContentsSigners());

@@ -3,12 +3,12 @@
 // with one of its own exit statuses.
 //
 // The package manager uses the newer signing block. apktoolkit uses the JAR signature. No other
-// program on the phone compares the signers of the two (docs/threat-model.md, "Before you ship
-// it"). DIGESTS comes from SignerDigests.java: the SHA-256 digest of the RSA modulus of each of the
-// package manager's signers, in lower-case hexadecimal, separated by commas. This program finds the
-// JAR signer with the tool's own code, so it finds the same signer as the tool. It is a separate
-// program because that code ends the process if memory runs out, and does not free all of its
-// memory.
+// program on the phone compares the signers of these two signatures (docs/threat-model.md, "Before
+// you ship it"). DIGESTS comes from SignerDigests.java: the SHA-256 digest of the RSA modulus of
+// each of the package manager's signers, in lower-case hexadecimal, separated by commas. This
+// program finds the JAR signer with the tool's own code, so it finds the same signer as the tool.
+// It is a separate program because that code ends the process if memory runs out, and does not free
+// all of its memory.
 #include <fcntl.h>
 #include <unistd.h>
 

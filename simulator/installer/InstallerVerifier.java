@@ -349,7 +349,8 @@ public final class InstallerVerifier {
         }
 
         // The value of the block's first pair with this ID, or null. The fields of a pair: a length
-        // of 8 bytes, an ID of 4 bytes, and the value.
+        // of 8 bytes, an ID of 4 bytes, and the value. Before the pairs is the block's size (8
+        // bytes), and after them are the size again and the magic (24 bytes).
         private static ByteBuffer find(DataSource source, int wanted) {
             try {
                 ApkUtils.ZipSections sections = ApkUtils.findZipSections(source);

@@ -45,8 +45,8 @@ std::optional<std::string> Installer::Missing() const {
   return {};
 }
 
-// The Java program opens the file by the path of this process's descriptor, because the file's own
-// name may contain any bytes, such as a line feed.
+// The Java program reads one path per line, but a file's own name may contain a line feed. The
+// program therefore gets the path of this process's descriptor.
 Judgement Installer::Judge(const std::string& file) {
   if (options_.use == InstallerUse::kOff) return {};
   const ScopedFd opened(open(file.c_str(), O_RDONLY | O_CLOEXEC | O_NONBLOCK | O_NOCTTY));

@@ -1,6 +1,6 @@
-// The judgement of the platform's own verifier: whether a phone's installer installs the package.
-// The answers come from another program, which may have read a hostile file. A malformed answer
-// counts as no answer.
+// The judgement of apksig, the platform's own verifier: whether a phone's installer installs the
+// package. apksig runs in a separate program, which may have read a hostile file. A malformed
+// answer of that program counts as no answer.
 #pragma once
 
 #include <climits>
@@ -56,7 +56,7 @@ struct Judgement {
   std::vector<RangeJudgement> ranges;  // sorted by level; neighbours have different judgements
 };
 
-// Parses one line of the verifier. The result's state is kJudged or kGaveUp.
+// Parses one line of the verifier's output. The result's state is kJudged or kGaveUp.
 Judgement ParseJudgement(const std::string& line);
 
 }  // namespace simulator

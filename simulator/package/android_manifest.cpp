@@ -83,7 +83,8 @@ std::optional<bool> ExtractsLibraries(const ResXMLParser& application) {
   return extracts;
 }
 
-// Compares the lengths first, because a long name may occur many times.
+// Compares the lengths first, so that a long name that occurs many times is not converted each
+// time.
 bool Is(const char16_t* text, const size_t* length, std::string_view expected) {
   return *length == expected.size() && Text(text, *length) == expected;
 }

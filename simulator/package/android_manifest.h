@@ -11,8 +11,8 @@
 namespace simulator {
 
 struct AndroidManifest {
-  // The strings of the document overlap. The platform's parser would use many times the size of
-  // the document, so the document is not read.
+  // The strings of the document overlap. The platform's parser could then use many times the
+  // document's size in memory, so the document is not read.
   bool has_overlaps = false;
   // The package's name as the tool's own code reads it; none if the document cannot be read.
   std::optional<std::string> package_name;

@@ -54,7 +54,7 @@ ArchiveWalk Archive::Walk(const EntryNames& names) const {
   ArchiveWalk walk;
   void* cookie = nullptr;
   if (ApkTools::StartZipIteration(handle_, &cookie, names.prefix, names.suffix) != 0) return walk;
-  bool has_ended = false;  // the tool's walk ends at the first error
+  bool has_ended = false;  // true after the first error, which ends the tool's iteration
   ZipEntry entry;
   std::string name;
   int32_t result;

@@ -36,11 +36,10 @@ inline constexpr EntryNames kAllNames = {"", ""};
 inline constexpr EntryNames kLibraryNames = {"lib/", ".so"};
 inline constexpr EntryNames kSignatureFileNames = {"META-INF/", ".SF"};
 
-// The entries of one kind, in the order in which the tool meets them.
+// The entries of one kind, in the order in which the zip library returns them to the tool.
 struct ArchiveWalk {
   std::vector<std::string> names;  // without those of damaged entries
-  // The number of these names that the tool's walk reaches. The walk ends at the first damaged
-  // entry.
+  // The number of these names that the tool reaches. The tool stops at the first damaged entry.
   size_t met = 0;
 };
 
@@ -70,7 +69,7 @@ class Archive {
   bool Has(const std::string& name) const;
   // Extracts the whole entry as the tool does. Changes `content` only if the result is kRead.
   ReadResult Read(const std::string& name, std::vector<uint8_t>* content);
-  // The same for entries of up to kLongestCompared bytes. Does not add to too_long().
+  // Like Read(), but for entries of up to kLongestCompared bytes. Does not add to too_long().
   ReadResult ReadToCompare(const std::string& name, std::vector<uint8_t>* content) const;
   // The names of the entries that Read() has refused so far, because they are too long.
   const std::vector<std::string>& too_long() const { return too_long_; }

@@ -33,8 +33,9 @@ struct CertificateFacts {
   // The end of the certificate's validity, in seconds since 1970 (UTC); none: it cannot be read.
   std::optional<int64_t> not_after;
   PublicKey key;
-  // A signature names its certificate by a SignerIdentifier. For this certificate, it has one of
-  // two contents: issuer and serial number, or the subject key identifier (which may be empty).
+  // A SignerIdentifier (RFC 5652) names a certificate by issuer and serial number, or by the
+  // subject key identifier. These are its contents in the two cases, for this certificate. `key_id`
+  // is empty if the certificate has no subject key identifier.
   std::string issuer_and_serial;
   std::string key_id;
 };

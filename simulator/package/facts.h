@@ -39,7 +39,7 @@ struct LibraryFacts {
   // The path to which an installer extracts it, relative to the package's directory; empty: `entry`
   // does not begin with the directory of an Arm ABI.
   std::string place;
-  bool is_met = true;          // true if the tool's walk over the libraries reaches it
+  bool is_met = true;          // true if the tool reaches `entry`; a damaged entry stops it
   int error = 0;               // errno of opening the file as the tool does; 0: it can be opened
   bool has_directory = false;  // the file's directory exists
 };
@@ -64,8 +64,8 @@ struct PackageFacts {
   bool has_damaged_signing_block = false;
   std::vector<std::string> too_long;  // the parts that were not read because they are too long
   std::vector<ListedEntry> entries;
-  std::vector<std::string> missing;  // names in the manifest that the archive does not have
-  // In the order in which the tool walks through them, damaged ones last.
+  std::vector<std::string> missing;  // names in MANIFEST.MF that the archive does not have
+  // In the order in which the tool reads their entries, damaged ones last.
   std::vector<LibraryFacts> libraries;
 };
 

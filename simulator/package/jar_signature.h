@@ -1,7 +1,7 @@
 // The JAR signature that the tool verifies, and facts that explain the tool's answer. The tool's
-// own code reads the texts, the key and the names of the files. Parts that only explain the answer
-// are read as strict DER (signature_block.h) or by libcrypto (certificate.h). Only the tool decides
-// whether the signature is valid.
+// own code finds the signature file and its block, and reads the signature file and the key. Parts
+// that only explain the answer are read as strict DER (signature_block.h) or by libcrypto
+// (certificate.h). Only the tool decides whether the signature is valid.
 #pragma once
 
 #include <cstddef>

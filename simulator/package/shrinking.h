@@ -4,8 +4,8 @@
 
 namespace simulator {
 
-// While a guard exists, the thread that made it reads zeros from such a page. A thread must not
-// have two guards at the same time.
+// While a guard exists, the thread that made it reads zeros from the pages beyond the new end. A
+// thread must not have two guards at the same time.
 class ShrinkGuard {
  public:
   ShrinkGuard();
@@ -13,7 +13,7 @@ class ShrinkGuard {
   ShrinkGuard(const ShrinkGuard&) = delete;
   ShrinkGuard& operator=(const ShrinkGuard&) = delete;
 
-  // True if this thread has read such a page since the guard was made.
+  // True if this thread has read a page beyond the new end since the guard was made.
   bool HasShrunk() const;
 };
 

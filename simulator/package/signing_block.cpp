@@ -12,7 +12,8 @@ constexpr std::string_view kMagic = "APK Sig Block 42";
 constexpr size_t kSizeField = 8;
 constexpr size_t kFooter = kSizeField + kMagic.size();
 
-// A block with more signers counts as damaged here. Phones accept at most ten.
+// The limit for the signers of all schemes together. A block with more signers counts as damaged
+// here. Phones accept at most ten.
 constexpr size_t kMostSigners = 16;
 
 // The known schemes. `id` identifies the scheme's pair in the block.
@@ -28,8 +29,9 @@ bool TakePrefixed(CBS* bytes, CBS* part);
 
 }  // namespace
 
-// A block consists of its size, the pairs, the size again, and the magic. Each size counts all
-// bytes after the first size field. If the two sizes differ, the platform finds no block.
+// A block consists of its size, pairs of an ID and a value, the size again, and the magic. Each
+// size counts all bytes after the first size field. If the two sizes differ, the platform finds no
+// block.
 std::string ReadSigningBlock(int fd, const ArchiveEnd& end, bool* is_too_large) {
   *is_too_large = false;
   if (end.directory_offset < kSizeField + kFooter) return {};

@@ -1,7 +1,7 @@
 // The signers of the schemes after JAR signing (v2, v3, v3.1). They are in the signing block, which
 // is between an archive's entries and its central directory. The block is found in the same way as
-// the platform finds it. Digests and signatures are not verified. The number of signers is limited,
-// and their certificates point into the caller's bytes.
+// the platform finds it. Digests and signatures are not verified. A block with too many signers
+// (kMostSigners) counts as damaged. The certificates point into the caller's bytes.
 #pragma once
 
 #include <cstdint>
@@ -20,8 +20,8 @@ struct NewerSigner {
 };
 
 struct SigningBlock {
-  // In the order of the block. If the block has several pairs for one scheme, the first pair
-  // counts.
+  // In the order of the block. If the block has several ID-value pairs for one scheme, the first
+  // pair counts.
   std::vector<NewerSigner> signers;
   // A part of the block is malformed. The signers are those before that part.
   bool is_damaged = false;

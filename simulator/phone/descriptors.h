@@ -1,5 +1,5 @@
-// Descriptors for the stand-ins. The tool's own files must get the same descriptors as without the
-// stand-ins.
+// Descriptors for the stand-ins, the libraries that answer in place of the phone. The tool's own
+// files must get the same descriptors as without the stand-ins.
 #pragma once
 
 #include <string>

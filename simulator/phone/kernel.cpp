@@ -3,7 +3,8 @@
 //
 // This file, integrity_file.cpp, log.cpp and standard_output.cpp are one library, which is loaded
 // before all others. It replaces the functions by which the tool uses the phone's kernel and log.
-// Calls that do not concern the phone are passed, unchanged, to the next function with that name.
+// Calls that do not concern the phone are passed, unchanged, to the function of the same name in a
+// library that is loaded later.
 #include <fcntl.h>
 #include <sys/mman.h>
 #include <sys/stat.h>
@@ -124,7 +125,7 @@ int Scratch() {
   return scratch;
 }
 
-// The files that were signed for this process.
+// The files that the simulated kernel signed during this process.
 struct SignedFiles {
   std::mutex mutex;
   std::vector<FileId> ids;

@@ -1,5 +1,6 @@
-// Finds the function that a stand-in replaces. The stand-in is loaded before all other libraries,
-// and passes on the calls that do not concern the phone.
+// Finds the function that a stand-in replaces. A stand-in is a library that answers in place of the
+// phone. It is loaded before all other libraries, and passes on the calls that do not concern the
+// phone.
 #pragma once
 
 #include <dlfcn.h>

@@ -1,7 +1,7 @@
-// Shared by the stand-ins inside the tool's process: the phone's settings, the journal, and a means
-// to keep errno unchanged for the tool. Each of the two stand-in libraries has its own copy.
-// Nothing here is destroyed at exit, because the tool's last output is recorded after the
-// destructors have run.
+// Shared by the two libraries that replace parts of the phone inside the tool's process
+// (stand-ins): the phone's settings, the journal, and a means to keep errno unchanged for the tool.
+// Each of the two libraries has its own copy of this code. Nothing here is destroyed at exit,
+// because the tool's last output is recorded after the destructors have run.
 #pragma once
 
 #include <cerrno>

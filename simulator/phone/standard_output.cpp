@@ -27,8 +27,8 @@ __attribute__((constructor)) void ReplaceStandardOutput() {
   stdout = stream;
 }
 
-// The C library flushes `stdout` after all destructors. The last output would be lost if a later
-// destructor ended the process.
+// The C library flushes `stdout` after all destructors. A destructor that runs after this one may
+// end the process before that. The last output would then be lost.
 __attribute__((destructor)) void FlushStandardOutput() { fflush(stdout); }
 
 }  // namespace

@@ -10,10 +10,10 @@
 namespace simulator {
 
 // `bytes` as a JSON string with its quotation marks. UTF-8 stays as it is, but quotation marks,
-// backslashes and hidden characters are escaped. A byte that belongs to no valid UTF-8 character is
-// written as the private character U+F7XX, XX being the byte. If `bytes` itself contains a
-// character from U+F780 to U+F7FF, each byte of this character is written in the same way, so that
-// decoding is unambiguous.
+// backslashes and hidden characters (IsHidden) are escaped. A byte that belongs to no valid UTF-8
+// character is written as the private character U+F7XX, XX being the byte. If `bytes` itself
+// contains a character from U+F780 to U+F7FF, each byte of this character is written in the same
+// way, so that decoding is unambiguous.
 std::string EncodeText(std::string_view bytes);
 
 // The reverse of EncodeText. `utf8` is the text as a JSON reader returns it.

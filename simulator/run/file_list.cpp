@@ -54,7 +54,8 @@ std::optional<std::string> ReadNames(const FileListOptions& options,
   if (!ReadAll(options.list, &content)) {
     return "cannot read " + title + ": " + strerrordesc_np(errno);
   }
-  // A file name cannot contain a NUL byte. The system would cut the name there.
+  // The system cuts a name at its first NUL byte. The part before this byte could name another
+  // file.
   if (!options.has_nul && content.find('\0') != std::string::npos) {
     return title + " contains NUL bytes; use -0 if its names end with NUL bytes";
   }

@@ -15,10 +15,10 @@ class FileWatch {
   // Remembers the state of the file at `path`. Construct the object before anything reads the file.
   explicit FileWatch(const std::string& path);
 
-  // Call it when nothing reads the file any more. If the file was changed since the construction,
-  // the run gets a failure in place of its result. A change of the inode alone, such as by a hard
-  // link or chmod, does not count if the bytes still have the digest that the run found. Does
-  // nothing if `path` was not a regular file, or if the run already has a failure.
+  // Call this function when nothing reads the file any more. If the file was changed since the
+  // construction, the run gets a failure in place of its result. A change of the inode alone, such
+  // as by a hard link or chmod, does not count if the bytes still have the digest that the run
+  // found. Does nothing if `path` was not a regular file, or if the run already has a failure.
   void Check(FileRun* run) const;
 
  private:

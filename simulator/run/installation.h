@@ -21,8 +21,8 @@ enum class InstalledAbi {
 
 // Which packages are laid out.
 enum class InstallWhen {
-  kAlone,   // packages with library entries, if nothing exists at the places where the tool looks
-            // for the libraries; not on a read-only file system
+  kAlone,   // packages with library entries, if neither these libraries nor an installer's library
+            // directories are beside the package; not on a read-only file system
   kAlways,  // all
   kNever,
 };
@@ -38,13 +38,13 @@ class Installation {
   Installation(const Installation&) = delete;
   Installation& operator=(const Installation&) = delete;
 
-  // Lays out the package at `file`. The file stays at its place if it is not a package, keeps its
-  // libraries inside, or has no libraries to lay out, or if `when` excludes it. Returns the reason
-  // of a failure, else none.
+  // Lays out the package at `file`. Lays out nothing if the file is not a package, keeps its
+  // libraries inside, or has no libraries for `abi`, or if `when` excludes the file. Returns the
+  // reason of a failure, else none.
   std::optional<std::string> LayOut(const std::string& file, InstallWhen when, InstalledAbi abi,
                                     const Deadline& deadline);
 
-  // The path of the package for the tool: the copy in the temporary directory, or `file` if it was
+  // The path of the package for the tool: base.apk in the temporary directory, or `file` if it was
   // not laid out.
   const std::string& path() const { return path_; }
   // True if the package was laid out.

@@ -19,8 +19,8 @@ struct Attempt {
     kBegun,  // the tool began, and no result is known
     kSigned,
     kKernelRefused,
-    kNotAsked,     // the tool may not sign: see `integrity`
-    kNotVerified,  // a library: see `why`
+    kNotAsked,     // the kernel was not asked, because the tool may not sign: see `integrity`
+    kNotVerified,  // a library that the tool refused: see `why`
     kVanished,     // a library that could not be opened again after its check
   };
 
@@ -59,7 +59,7 @@ struct RunRecord {
   Events events;  // all events, in order
   std::string file;
   std::string path;
-  std::string installed;  // of a package that was laid out: <install>/base.apk; else empty
+  std::string installed;  // <install>/base.apk if Installation laid out the package; else empty
   bool is_silent = true;  // the journal has no event of the tool before its exit
 
   std::vector<LogLine> opening_errors;  // before the first step

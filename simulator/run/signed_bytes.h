@@ -32,12 +32,13 @@ class SignedBytes {
   // that cannot be read before the deadline.
   bool Holds(const std::string& path, const Deadline& deadline);
 
-  // Remembers the present bytes of the file at `path`. Returns false if they cannot be kept.
+  // Remembers the present bytes of the file at `path`. Returns false if the deadline passed, or if
+  // the digest cannot be written. Returns true even if the file is gone or cannot be read.
   bool Add(const std::string& path, const Deadline& deadline);
 
  private:
-  // A file in its state at the signing. It is digested later, if needed, and only if its state is
-  // still the same.
+  // A signed file, and its state when it was signed. The file is digested later, if needed, and
+  // only if its state is still the same.
   struct Seen {
     std::string path;
     struct stat state;

@@ -160,7 +160,8 @@ PhoneSettings Simulator::PhoneFor(const Task& task) {
   return phone;
 }
 
-// The loader treats spaces and colons as separators. The path of a descriptor has neither.
+// The dynamic loader treats spaces and colons in LD_PRELOAD as separators. The path of a descriptor
+// has neither.
 std::string Simulator::PreloadName() const {
   if (kernel_.find_first_of(" :") == std::string::npos) return kernel_;
   return OwnDescriptorPath(kernel_descriptor_->get());

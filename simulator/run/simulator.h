@@ -22,7 +22,7 @@ struct RunOptions {
   std::vector<std::string> trust;  // existing files that the kernel trusts
   std::string state;               // the directory for --state; an empty text: none
   InstallWhen install = InstallWhen::kAlone;
-  InstalledAbi abi = InstalledAbi::kPreferred;  // whose libraries are laid out
+  InstalledAbi abi = InstalledAbi::kPreferred;  // whose libraries are extracted
   unsigned jobs = 1;                            // how many files at a time
   std::string tool;                             // the program that is run
   bool is_own_tool = false;                     // it is the tool beside this program
@@ -33,7 +33,7 @@ struct RunOptions {
 // The results of one run. MakeReport judges them.
 struct FileRun {
   RunRecord record;
-  PackageFacts facts;   // of the file that the tool was given, which may be a laid-out copy
+  PackageFacts facts;   // of the file that the tool was given, which may be in an Installation
   std::string journal;  // the lines of this run, from "start" to "exit"
 };
 

@@ -38,7 +38,8 @@ class OutputFile {
   void Close() { file_.reset(); }
   // Appends `text`. Returns false, with errno set, if it cannot be written.
   bool Append(std::string_view text) const;
-  // The message for the user directly after a failure, with errno as its reason.
+  // The message for the user after a failure of Open or Append. Call it directly after the failure,
+  // because it uses errno.
   std::string ErrorText() const;
 
  private:

@@ -37,8 +37,8 @@ kainjow::mustache::list OneIf(bool condition);
 std::string Grouped(uint64_t number);
 
 // Sets the sections of a list: "NAME_shown" if there are lines, `name` with the fields that `make`
-// returns for the first lines, and "NAME_more" if there are more lines. Sets "NAME_count" to the
-// number of all lines. `remark` follows the number of lines that are left out.
+// returns for each of the first kMostPageLines lines, and "NAME_more" if there are more lines. Sets
+// "NAME_count" to the number of all lines. `remark` follows the number of lines that are left out.
 template <typename Lines, typename Make>
 void AddLines(const std::string& name, const Lines& lines, const std::string& remark, Make make,
               kainjow::mustache::data* file) {

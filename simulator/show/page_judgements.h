@@ -1,4 +1,5 @@
-// The page's table of judgements on a file: that of the tool, and those of the phones' installer.
+// The page's table for a file: the judgement of the tool, and the judgements of the phones'
+// installer.
 #pragma once
 
 #include <kainjow/mustache.hpp>
@@ -7,7 +8,8 @@
 
 namespace simulator {
 
-// Sets the sections of the table. It is empty for a file that is not a package.
+// Sets the template's sections that make the table. The table is empty for a file that is not a
+// package.
 void AddJudgements(const Report& report, kainjow::mustache::data* file);
 
 }  // namespace simulator

@@ -119,8 +119,8 @@ size_t RankOf(Verdict verdict) {
                              std::begin(kWorstFirst));
 }
 
-// The decisive reason. Without a reason, the signer for whom phones install the package if that is
-// not the JAR signer. Then the alarms.
+// Starts with the decisive reason. If there is none, starts with the other signer for whom phones
+// install the package, if there is one. The alarms follow.
 std::string ReasonText(const Report& report) {
   std::vector<std::string> facts = {DecisiveReason(report)};
   if (facts[0].empty()) facts[0] = OtherOwnerText(report);

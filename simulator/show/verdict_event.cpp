@@ -67,8 +67,8 @@ std::string SignerJson(const std::string& scheme, const CertificateFacts& signer
   return Object(members);
 }
 
-// If the report has a key, the modulus digest of the JAR signer ("v1") is the digest of this key.
-// Readers other than the tool may find another key in the certificate.
+// For the JAR signer ("v1"), the report's key has precedence. It is the key that the kernel got or,
+// if it got none, the key that the tool reads. libcrypto may find another key in the certificate.
 std::string SignersJson(const Report& report) {
   std::vector<std::string> signers;
   if (report.signer || report.key) {

@@ -84,9 +84,9 @@ inline const std::string& PathForTool(const Report& report) {
 inline constexpr char kLaidOutText[] =
     "its libraries were laid out beside it, as an installer does; --install=no turns this off";
 
-// True if the cure is shown below the item. It is not shown if nothing is wrong, or for a
-// consequence of another cause. If consecutive items have the same cause, only the last of these
-// items shows the cure. `next` is the next item, or null.
+// True if the cure, which says what to do, is shown below the item. It is not shown if nothing is
+// wrong, or for a consequence of another cause. If consecutive items have the same cause, only the
+// last of these items shows the cure. `next` is the next item, or null.
 bool HasCure(const Item& item, const Item* next);
 
 // The link's text, or "not reached" for each link after a broken one.

@@ -17,11 +17,11 @@ enum class Group {
   kKey,
   kTool,
   kInstaller,  // a phone's installer does not install the package
-  kGate,       // the file does not meet a demand, such as --signer
+  kGate,       // the file does not meet a demand of the gate (gate.h), such as --signer
   kWarning,    // a fact that the user should check, even if everything was signed
 };
 
-// The effect of a cause on its item.
+// The effect of a cause on the file or on one of its items (Item in report.h).
 enum class Severity {
   kFailed,   // there is no result for the file
   kUnseen,   // the tool left the file alone
@@ -401,7 +401,7 @@ inline constexpr Cause kInstallerGaveUp = {"installer-gave-up", Group::kInstalle
     "did not build this package, do not trust it. A large package may need a larger --timeout; "
     "--installer=off judges without the installer."};
 
-// ---- The gate: demands on the file in addition to the phone's answer.
+// ---- The gate (gate.h): demands that a file must meet even if the phone accepts it.
 inline constexpr Cause kSignerUnexpected = {"signer-unexpected", Group::kGate, Severity::kRefused,
     ChainLink::kNone, "", "its signer is not one that --signer names: %s",
     "Sign it with the key that --signer names; a rotated key has to be named as well. If you did "

@@ -132,7 +132,8 @@ void Refuse(ItemKind kind, const char* name, const Reason& reason, Report* repor
   if (StatusOf(report->verdict) == kAllSigned) report->verdict = Verdict::kNotAccepted;
 }
 
-// The signer that the kernel knows. The certificate counts only if it shows the kernel's key.
+// The JAR signer, with the key that the kernel got or would get. The certificate of the report
+// counts only if it contains this key.
 CertificateFacts JarSigner(const Report& report) {
   CertificateFacts signer;
   const std::string modulus = report.key ? report.key->sha256 : "";

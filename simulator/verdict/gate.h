@@ -1,5 +1,5 @@
 // The demands on each file in addition to the phone's answer: the expected signer (--signer), no
-// warnings (--werror), and one signer for all files of a package name (always).
+// warnings (--werror), and one signer for all files with the same package name (always).
 #pragma once
 
 #include <map>
@@ -31,11 +31,11 @@ class Gate {
   // Adds an item to the report for each demand that the file does not meet. A good verdict then
   // becomes kNotAccepted. Changes nothing for a file that was not looked at or not simulated.
   // Called once per file, in the order of the command line, because each verified package is
-  // compared with the first one of its package name.
+  // compared with the first one that has the same package name.
   void Judge(Report* report);
 
  private:
-  // The signers of the first file of a package name.
+  // For one package name: the signers of the first file that has it.
   struct First {
     std::string file;
     CertificateFacts jar;

@@ -1,4 +1,4 @@
-// The item for the judgement of the phones' installer.
+// The item of a report for the judgement of the phones' installer.
 #include <algorithm>
 
 #include "simulator/verdict/parts.h"
@@ -50,7 +50,7 @@ std::string TakersText(const Judgement& judgement) {
 }
 
 // Phones verify only the newest of the package's schemes that they know. All signers of that scheme
-// count.
+// count. The last range that installs the package decides, because it has the newest phones.
 const CertificateFacts* OtherSigner(const Judgement& judgement, const Report& report) {
   const CertificateFacts* other = nullptr;
   for (const RangeJudgement& range : judgement.ranges) {

@@ -182,8 +182,8 @@ void AddKeyItems(const RunRecord& run, const JudgeOptions& options, std::vector<
 }
 
 // Adds the failures that no other item reports. An error from the opening of the file usually
-// belongs to the file's own item. For a JAR, it shows only why the file is not a package. If the
-// tool tried to sign a package nevertheless, the error is a separate failure.
+// belongs to the file's own item. For a JAR, the error shows only why the file is not a package. If
+// the tool tried to sign a package despite the error, the error is a separate failure.
 void AddToolItems(const RunRecord& run, const JudgeOptions& options, std::vector<Item>* items) {
   const auto add = [&](const Reason& reason) {
     items->push_back(NotDone(ItemKind::kTool, "tool", reason, options));

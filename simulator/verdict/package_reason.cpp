@@ -67,7 +67,7 @@ Reason WhyNotLookedAt(const RunRecord& run, const PackageFacts& facts) {
 }
 
 // A classes.dex does not count as a part of a package, because JARs of the platform have one as
-// well. They have neither resources nor libraries.
+// well. These JARs have neither resources nor libraries.
 Reason WhyTakenForAJar(const PackageFacts& facts) {
   std::string part;
   bool has_packages = false;

@@ -21,7 +21,7 @@ enum class Verdict {
   kTrustedJar,
   kPartlySigned,
   kNotInstallable,  // something was signed, but phones do not install the package
-  kNotAccepted,     // everything was signed, but the command line's gate refuses it
+  kNotAccepted,     // everything was signed, but a further demand is not met (gate.h)
   kRefused,
   kNotTrustedJar,
   kNotLookedAt,
@@ -105,7 +105,7 @@ struct Link {
 struct Report {
   std::string file;       // as given
   std::string path;       // absolute, without symbolic links
-  std::string installed;  // of a package that was laid out: <install>/base.apk; else empty
+  std::string installed;  // the copy with extracted libraries: <install>/base.apk; empty: none
   Verdict verdict = Verdict::kNotSimulated;
   std::string package_name;  // as the tool reads it
   std::vector<Item> items;
@@ -134,8 +134,8 @@ const Item* DecisiveItem(const Report& report);
 // Returns such a signer, or null if there is none. Reads only the signer and the key of the report.
 const CertificateFacts* OtherSigner(const Judgement& judgement, const Report& report);
 
-// True for an item of the tool's own run. All other items belong to the installer or to the command
-// line.
+// True for an item of the tool's own run. All other items are about the phones' installer or
+// about a demand that is not met (gate.h).
 bool IsByTool(const Item& item);
 
 // The exit status for a verdict.

@@ -21,7 +21,7 @@ inline std::string Joined(const std::vector<std::string>& words) {
   return text;
 }
 
-// The number of the names with their noun, and the first of them: "3 entries: a, ...".
+// The number of entries, and the name of the first one: "3 entries: a, ...".
 inline std::string CountedNames(const std::vector<std::string>& names) {
   return Counted(names.size(), "entry", "entries") + ": " + names[0] +
          (names.size() > 1 ? ", ..." : "");
@@ -31,8 +31,8 @@ inline std::string CountedNames(const std::vector<std::string>& names) {
 std::string LevelText(const LevelRange& levels);
 
 // Names the phones that install the package, and the schemes by which they verify its signer:
-// "phones of API 27 and later install it, verified by v2, v3". Empty unless all phones that apksig
-// was asked about install it.
+// "phones of API 27 and later install it, verified by v2, v3". Empty unless all phones about which
+// apksig (the platform's verifier) was asked install the package.
 std::string TakersText(const Judgement& judgement);
 
 // The name of the JAR signer's key, such as "RSA-2048": of the report's key, or else of the
