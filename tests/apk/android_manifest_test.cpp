@@ -292,7 +292,8 @@ TEST(AndroidManifestSurrogates, AShorterNameDoesNotMatchWithAnyNumberOfThem) {
   EXPECT_EQ(Read(xml), (Facts{"", false}));
 }
 
-// Without this limit, each comparison could read as much text as a hostile document has.
+// A name with more than 16 unpaired surrogates does not match. Without this limit, each comparison
+// could read all text of a hostile document.
 TEST(AndroidManifestSurrogates, MoreThanSixteenMakeAnotherName) {
   for (const size_t count : {16, 17}) {
     CompiledXml xml(CompiledXml::Pool::kUtf16);
@@ -378,7 +379,8 @@ TEST(AndroidManifestDocument, OneThatIsCutShortAnywhereIsReadOrRefusedWithoutHar
   EXPECT_LT(read, whole.size());
 }
 
-// Returns the document with `new_bytes` in place of `old_bytes`, which must occur once.
+// Returns the document with `new_bytes` in place of the first `old_bytes`. The document must
+// contain `old_bytes`.
 Bytes Replaced(Bytes document, const Bytes& old_bytes, const Bytes& new_bytes) {
   const auto at = std::search(document.begin(), document.end(), old_bytes.begin(), old_bytes.end());
   EXPECT_NE(at, document.end());
@@ -386,7 +388,8 @@ Bytes Replaced(Bytes document, const Bytes& old_bytes, const Bytes& new_bytes) {
   return document;
 }
 
-// If no NUL follows a name, the platform's library returns the name's length but no text.
+// The changed document claims a length of 9 for the name "manifest", and no NUL follows the ninth
+// byte. The platform's library then returns the name's length but no text.
 TEST(AndroidManifestDocument, AnElementWhoseNameDoesNotEndIsPassedOver) {
   CompiledXml xml;
   xml.Element("manifest", {Package("a")}).Element("permission", {AndroidName(kPermission)});

@@ -30,7 +30,8 @@ std::ostream& operator<<(std::ostream& out, const State& state) {
   return out << state.good_zip << state.apk << state.good_apk << state.open;
 }
 
-// The package must not have "classes.dex": IsGoodApk is then the verdict of Init alone.
+// The package must not have "classes.dex", because IsGoodApk would also check this entry. The flag
+// `good_apk` must be the verdict of Init alone.
 State StateOf(Apk& apk) {
   void* cookie = nullptr;
   const int32_t result = apk.StartIteration(&cookie, "", "");

@@ -43,7 +43,8 @@ TEST(Extraction, AnEmptyEntryIsExtracted) {
   }
 }
 
-// Deflate encodes 258 zeros in two bits, so zeros come closest to its limit.
+// Deflate encodes at most 258 bytes in two bits, so its limit is 1032 bytes in one byte. Zeros come
+// close to this limit.
 TEST(Extraction, TheBestDeflatedDataIsPlausible) {
   const Bytes zeros(10 << 20, 0);
   OpenEntry zip({"a", zeros, true});
@@ -112,7 +113,7 @@ TEST(Extraction, ALongEntryThatLiesLeavesTheVectorAlone) {
   }
 }
 
-// The library's code for data that does not inflate.
+// The zip library's code for data that does not inflate.
 constexpr int32_t kZlibError = -2;
 
 TEST(Extraction, AnEntryThatDoesNotInflateHasTheLibrarysCode) {

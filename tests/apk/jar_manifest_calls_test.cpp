@@ -1,6 +1,6 @@
 // Counts the comparisons that the readers of a JAR manifest make, and changes the direction in
-// which they copy. The results of the readers show neither. The linker redirects the calls of the
-// whole program to the functions below.
+// which they copy. The results of the readers show neither. The linker redirects all calls of
+// memcmp, bcmp and memcpy in this program to the functions below.
 #include <gtest/gtest.h>
 
 #include <algorithm>
@@ -68,9 +68,10 @@ std::vector<std::string> ShortNames(size_t count) {
   return names;
 }
 
-// A sort compares each name with about log2(count) others. The section is sorted again only after
-// its number of names has more than doubled. All sorts together therefore make at most twice the
-// comparisons of one sort. This test allows twice that number.
+// A sort compares each name with about log2(4096) = 12 others. Before its end, the section is
+// sorted again only after its number of names has more than doubled. At its end, it is sorted once
+// more. Here all sorts together make about twice the comparisons of that last sort. This test
+// allows twice that number.
 TEST_F(JarManifestCalls, DistinctShortNamesAreSortedInLogarithmicTime) {
   std::vector<std::string> names = ShortNames(4096);
   std::shuffle(names.begin(), names.end(), std::mt19937(1));

@@ -224,7 +224,7 @@ TEST(ManifestMf, AnyOtherByteAfterAColonFails) {
               "Parse manifest: Error: P_COLON: unexpected 0x09 after colon: \t\n");
 }
 
-// The record ends at the NUL that is printed for the missing byte.
+// The log record ends at the NUL that the message has in place of the missing byte.
 TEST(ManifestMf, ColonAtTheEndOfTheTextFails) {
   ExpectFault("Key:", "Parse manifest: Error: P_COLON: unexpected 0x00 after colon: ");
 }
@@ -340,7 +340,7 @@ TEST(ManifestMf, EveryKindOfLineBreakEndsLinesAndSections) {
   }
 }
 
-// Tests every byte at every position of lines of 1 to 24 bytes.
+// Tests every byte at every position of values of 1 to 24 bytes.
 TEST(ManifestMf, OnlyCrLfAndNulEndALine) {
   for (size_t length = 1; length <= 24; ++length) {
     for (size_t at = 0; at < length; ++at) {

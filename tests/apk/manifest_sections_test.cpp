@@ -130,8 +130,8 @@ TEST(ManifestSection, OfEqualNamesTheLastInTheTextCounts) {
 
 // Two long names that differ only in their last byte come before very many short ones. The long
 // names are unreadable while the short ones are added. The addition of the second long name
-// compares them once. They must not be compared again before the text has advanced, from there, by
-// the length of both.
+// compares them once. They must not be compared again before the text has advanced, from the start
+// of the second name, by the length of both.
 TEST(ManifestSection, LongNamesAreComparedAgainOnlyWhenAsMuchTextHasFollowed) {
   constexpr uint32_t kLength = 1 << 20;
   constexpr size_t kAll = 3 * kLength;

@@ -18,7 +18,8 @@ namespace {
 
 constexpr long kMegabyte = 1 << 10;  // in kilobytes
 
-// The freed memory that AddressSanitizer keeps for a while, in kilobytes.
+// The freed memory that AddressSanitizer keeps for a while, in kilobytes. By default it
+// keeps 256 MB.
 #ifndef __has_feature
 #define __has_feature(feature) 0
 #endif
@@ -103,8 +104,9 @@ TEST(ApkMemory, NamesThatRepeatTakeNone) {
   EXPECT_LT(growth, 60 * kMegabyte + kKept);
 }
 
-// A million sections of one attribute each. A section takes 20 bytes in the table, and 20 more
-// bytes while the table grows. Repeated names after these sections take no memory in the table.
+// A million sections of one attribute each. Each section takes 20 bytes in ManifestSections, and 20
+// more bytes while ManifestSections grows. Repeated names after these sections take no memory
+// there, but they make the text itself 20 MB longer.
 TEST(ApkMemory, NamesThatRepeatTakeNoneAfterManySections) {
   const std::string sections = Repeat("A: 1\n\n", 1000000);
   const long growth = GrowthWithSignatureFile(sections);

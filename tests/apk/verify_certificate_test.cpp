@@ -119,9 +119,9 @@ TEST(VerifyCertificate, AKeyOf2048BytesAlreadyFailsAtTheCertificate) {
 }
 
 TEST(VerifyCertificate, AnEmptyKeyFailsAtTheCertificate) {
-  // The INTEGER of the modulus has the two bytes 0 and 1, because its length is also the limit for
-  // the exponent's element, and the header of the exponent has two bytes. The modulus is read
-  // without the leading zero, so it has one byte.
+  // The exponent is empty, so its element is only a header of two bytes. The length of the modulus
+  // INTEGER is the limit for this element. The INTEGER therefore has two bytes, 0 and 1. The
+  // modulus is read without the leading zero, so it has one byte.
   EXPECT_EQ(LogOf(WithBlock(WithPublicKey({0, 1}, {}, 256))),
             Records({Error("RSA could not verify certificate: 5\n"), Error(kNotVerified)}));
 }

@@ -1,7 +1,8 @@
-// In a build with _FORTIFY_SOURCE, as in every platform tree, Bionic's headers give some calls
-// another name. For example, read becomes __read_chk. The preset `fortify` does the same here, to
-// check that the tests also replace the calls under these names (--wrap). The workstation's C
-// library has the same functions, but its headers rarely call them.
+// In a build with _FORTIFY_SOURCE, Bionic's headers give some calls another name. For example, read
+// becomes __read_chk. Every source tree of the platform builds in this way. The tests replace some
+// calls by functions of their own (--wrap), and must also do so under these names. The preset
+// `fortify` checks this on a workstation. The workstation's C library has functions such as
+// __read_chk, but its headers rarely call them. This header therefore calls them.
 //
 // The preset includes this header at the start of every source (-include). Each function below is
 // an overload of a C library's function, because it has a pass_object_size parameter. The compiler

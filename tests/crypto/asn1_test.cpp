@@ -12,8 +12,7 @@
 
 namespace {
 
-// A copy of the first `length` bytes that ends where memory ends, so that reading past them
-// crashes.
+// Returns a copy of the first `length` bytes. A read past the end of the copy crashes.
 GuardedBytes Cut(const Bytes& bytes, size_t length) {
   return GuardedBytes(Bytes(bytes.begin(), bytes.begin() + static_cast<ptrdiff_t>(length)));
 }
@@ -435,8 +434,8 @@ TEST(Asn1BitStringToLong, LastBitOfTheFirstByteIsBitSeven) {
 }
 
 TEST(Asn1BitStringToLong, BytesGoUpwardsWithTheirBitsReversed) {
-  // Each byte is reversed (numbers in hexadecimal): 12 = 00010010 -> 01001000 = 48; 34 = 00110100
-  // -> 2c; 56 = 01010110 -> 6a; 78 -> 1e.
+  // The bits of each byte are reversed: 0x12 = 00010010 becomes 01001000 = 0x48. In the same way,
+  // 0x34 becomes 0x2c, 0x56 becomes 0x6a, and 0x78 becomes 0x1e. The first byte is the lowest.
   EXPECT_EQ(asn1_bit_string_to_long(FromHex("00 12 34 56 78").data(), 5), 0x1e6a2c48u);
 }
 

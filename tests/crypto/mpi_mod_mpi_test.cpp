@@ -97,11 +97,12 @@ TEST(MpiModMpi, OfTwoToThe8192ForAModulusOf128Limbs) {
   EXPECT_EQ(mpz_class(PowerOfTwo(8192) % Value(N)), Value(RR));
 }
 
-// The numbers are hexadecimal. d, the top limb of the divisor, is 8000ffff. The half digit of
-// 48000000 0000 is estimated as 9000, with remainder 0. d is added to the remainder until the sum
-// wraps or is at least 9000 * ffff. The first sum is d itself. It did not wrap, so d must be added
-// again. Code that stops after the first addition gets a digit that is far too large, and then
-// reduces the digit by one at a time.
+// The numbers are hexadecimal. d, the top limb of the divisor, is 8000ffff. half_digit
+// (crypto/mpi.cpp) first divides by the upper half of d: 48000000 / 8000 is 9000, with remainder 0.
+// It then adds d to the remainder until the sum wraps or is at least 9000 * ffff. The first sum is
+// d itself. This sum did not wrap and is less than 9000 * ffff, so d must be added again. Code that
+// stops after the first addition gets a digit that is far too large, and then reduces the digit by
+// one at a time, which is slow.
 TEST(MpiModMpi, EndsAtOnceIfTheRemainderEqualsTheDivisor) {
   const Number A({0x12345678, 0x0000abcd, 0x48000000});
   const Number B({0xfedcba98, 0x8000ffff});

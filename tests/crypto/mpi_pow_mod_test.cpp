@@ -122,9 +122,8 @@ TEST(MpiMontmul, SubtractsAlsoWhereTheProductIsBelowTheModulus) {
   Number T(Limbs(4));
   mpi_montmul(&A, &B, &N, 1, &T);
   EXPECT_EQ(15, Value(A));
-  // The lower limb of T contained A's old limb, 3. The upper limb contained the product, 15. The
-  // product was then subtracted from T. This left 3 - 15 in the lower limb, and borrowed 1 from the
-  // upper limb.
+  // Limb 0 of T contained A's old limb, 3. Limb 1 contained the product, 15. The product was then
+  // subtracted from T. This left 3 - 15 in limb 0, and borrowed 1 from limb 1.
   EXPECT_EQ(static_cast<uint32_t>(3 - 15), T.p[0]);
   EXPECT_EQ(14u, T.p[1]);
 }

@@ -10,7 +10,7 @@
 #include "support/guarded_bytes.h"
 #include "support/signature_block.h"
 
-// The printed lines.
+// Lines that processCert prints when it fails.
 inline constexpr char kHeaderTrailer[] = "CERT_PARCER [ERROR]: processPKCS7Header() error\n";
 inline constexpr char kKeyTrailer[] = "CERT_PARCER [ERROR]: processPublicKey() error\n";
 inline constexpr char kSignerTrailer[] = "CERT_PARCER [ERROR]: processSignHeader() error\n";

@@ -90,7 +90,7 @@ bool HasExtension(const std::vector<std::string>& lines, const std::string& titl
   });
 }
 
-// Each kept attribute as "TYPE VALUE-IN-HEX".
+// Each attribute that the tool's parser keeps, as "TYPE VALUE-IN-HEX".
 std::vector<std::string> NameLines(const x509_name& name) {
   std::vector<std::string> lines;
   for (size_t i = 0; i < name.attribute_count; ++i) {

@@ -13,7 +13,8 @@ constexpr char kSubjectAltName[] = "2.5.29.17";
 constexpr char kBasicConstraints[] = "2.5.29.19";
 constexpr char kUnknown[] = "1.2.3.4";
 
-// Returns the element with a length that is greater by `more`. Both lengths have one octet.
+// Returns the element with a length that is greater by `more`. The old and the new length must fit
+// in one octet.
 Bytes RunningOn(Bytes element, size_t more = 1) {
   EXPECT_LT(element[1] + more, 0x80u);
   element[1] = static_cast<uint8_t>(element[1] + more);
@@ -116,8 +117,9 @@ TEST(X509RunningOn, ElementsOfANameMayNotTakeBytesAfterTheirContainer) {
   for (const Bytes& name : cases) EXPECT_EQ(ResultOf(WithSubject(name)), -12);
 }
 
-// The second time lacks its end. The subject after it has 90 bytes of contents, so it starts with
-// 30 5a. As text, these bytes are "0Z", which would complete the time.
+// In the first case, the second time does not end in "Z". In the second case, its last two
+// characters are missing. The subject follows the times. It has 90 bytes of contents, so it starts
+// with 30 5a. As text, these bytes are "0Z", which would complete the time.
 TEST(X509RunningOn, TimeIsMinus13) {
   Certificate certificate = WithSubject(Name({{kCommonName, std::string(79, 'x')}}));
   ASSERT_EQ(certificate.subject[0], '0');

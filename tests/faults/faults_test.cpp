@@ -1,6 +1,6 @@
 // Makes each call of the tool to certain C library functions fail, one per run. The tool must end
-// normally, or abort because a container gets no memory. The kernel must never sign a file that the
-// tool did not verify.
+// normally, or abort because a C++ container gets no memory. The kernel must never sign a file that
+// the tool did not verify.
 #include <fcntl.h>
 #include <gtest/gtest.h>
 #include <signal.h>
@@ -166,7 +166,7 @@ TEST(FaultsOfCalls, OnAGoodPackageCostTheirOwnStep) {
              {{"open", {"", "PK", "PK"}},     // the package; the library, to read it and to sign it
               {"read", {"PK"}},               // the library
               {"fopen", {"PK", "LK"}},        // the tool's integrity value, before each signing
-              {"fcntl", {"PK", "PK", "LK"}},  // keeps the library open; signs it; signs the package
+              {"fcntl", {"PK", "PK", "LK"}},  // a copy of the library's descriptor; both signings
               {"readlink", {"PK", "LPK"}},    // the libraries' directory; a message
               {"fstatvfs", {"LPK"}},          // the file system then counts as writable
               {"fgetxattr", {}}});            // only JARs have attributes
@@ -223,10 +223,10 @@ bool IsAbort(const ToolEnd& ending) {
   return ending.how == ToolEnd::How::kKilled && ending.value == SIGABRT;
 }
 
-// Makes each request for memory fail, one per run. A run may end with the abort of a container. Its
-// grants must be the first letters of `all`, and at least as many as in each earlier run that
-// aborted. In any other run, the tool and its libraries handle the missing memory: the run must end
-// normally, and its grants must be one of `ways`.
+// Makes each request for memory fail, one per run. A run may end with an abort because a C++
+// container gets no memory. Its grants must be the first letters of `all`, and at least as many as
+// in each earlier run that aborted. In any other run, the tool and its libraries handle the missing
+// memory: the run must end normally, and its grants must be one of `ways`.
 void ExpectRunsWithoutMemory(Installed& file, const std::string& all,
                              const std::set<std::string>& ways) {
   constexpr int kMostCalls = 20000;

@@ -1,4 +1,5 @@
-// Runs the caller with real programs in the simulated phone, which remembers signed files.
+// Runs the code of integration/caller with real programs in the simulated phone, which remembers
+// signed files.
 #include "integration/caller/sign_package.h"
 
 #include <gtest/gtest.h>

@@ -133,7 +133,7 @@ TEST(Signers, RetiredKeyIsNotASigner) {
   ExpectRun(SignersOf(apk, 27), apk);
 }
 
-// As in the tool, the signer of a leased package is read after the holder gives up the lease.
+// Like the tool, apktoolkit-bound reads a leased package after the holder gives up the lease.
 TEST(Signers, OfALeasedPackageAreWaitedFor) {
   const TempDir directory;
   const std::string apk = directory / "base.apk";

@@ -1,8 +1,8 @@
 #!/usr/bin/env python3
-"""add_v3.py APK CERTIFICATE KEY FIRST LAST [ID]: adds a signature to the signing block of the package,
-and keeps the block's other signatures. Makes the block if there is none. The signature is a v3
+"""add_v3.py APK CERTIFICATE KEY FIRST LAST [ID]: adds a signature to the signing block of the package
+APK, and keeps the block's other signatures. Makes the block if there is none. The signature is a v3
 signature for phones of the API levels FIRST to LAST. The hexadecimal ID names another scheme that has
-the form of v3. openssl signs."""
+the form of v3. openssl makes the signature."""
 
 import hashlib
 import struct

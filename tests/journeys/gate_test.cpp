@@ -1,5 +1,6 @@
-// The simulator as the gate of a pipeline: expected signers, warnings that count as refusals, and
-// the journal that a program reads. openssl computes the expected digests.
+// Tests what a build pipeline needs from the simulator to stop bad packages: expected signers,
+// warnings that count as refusals, and the journal that a program reads. openssl computes the
+// expected digests.
 #include <gtest/gtest.h>
 
 #include <filesystem>

@@ -1,5 +1,5 @@
-// Packages that verify: the files that are signed, their payloads, the key that is registered, and
-// the order of these steps.
+// Good packages: the files that are signed, their payloads, the key that is registered, and the
+// order of these steps.
 #include <gtest/gtest.h>
 
 #include <filesystem>

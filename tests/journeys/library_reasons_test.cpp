@@ -57,7 +57,7 @@ TEST_F(Reason, LibrariesOfAnotherProcessorAreNotLaidOut) {
   EXPECT_EQ(Told(4, {"--install=all", "--strict"}).back(), "-> 0");
 }
 
-// With --strict, a library that no installer puts beside the package still counts as refused.
+// With --strict, a library that no installer puts beside the package counts as refused.
 TEST_F(Reason, StrictRefusesALibraryThatNoInstallerTakes) {
   MakePackage(WithLibraries({{"lib/arm64-v8a/libx.so", ToBytes("x")},
                              {"lib/arm64-v8a/sub/liby.so", ToBytes("y")}}))
@@ -109,7 +109,7 @@ TEST_F(Reason, PackageWithoutLibrariesBesideItIsLaidOut) {
         << installed.output;
     EXPECT_EQ(installed.output.find("laid out"), std::string::npos);
   }
-  // A directory lib without lib/arm64 and lib/arm does not count.
+  // With an empty directory lib, the package does not count as installed.
   Do("rm -rf lib; mkdir lib");
   EXPECT_EQ(run().output, alone.output);
 }

@@ -20,7 +20,7 @@ class GoodPackageOn : public testing::Test {
     MakePackage(options).WriteTo(apk_);
   }
 
-  // The end of every timeline when libzu is healthy.
+  // The end of every timeline when libzu reports success.
   std::string RegisteredAndExit() const {
     return Timeline({Register(3, apk_, "com.example.app", ModulusOf("rsa-2048")),
                      Log(4, "ZuAddCertificate: ZuNewCertificate return 0.\n"), Exit(0)});

@@ -48,11 +48,12 @@ inline Lines WithoutReason(size_t lines, Lines all) {
   return all;
 }
 
-// A copy of a golden package with its libraries beside it. Each test damages its copy.
+// A copy of a package that make_golden_packages made, with its libraries beside it. Most tests
+// damage their copy.
 class Reason : public testing::Test {
  protected:
-  // Copies `name`, a directory or a package that make_golden_packages made, into the test's
-  // directory.
+  // Copies `name`, one of these packages or a directory with a package and its libraries, into the
+  // test's directory.
   void Take(const std::string& name) {
     const std::filesystem::path source = std::filesystem::path(GOLDEN_PACKAGES) / name;
     if (std::filesystem::is_directory(source)) {

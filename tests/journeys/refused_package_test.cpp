@@ -233,7 +233,7 @@ TEST_F(IncompletePackage, LibraryThatIsAPipeOnDiskIsRefused) {
                              Log(6, "VeltSignJni: File not verified: " + library_ + "\n")});
 }
 
-// In its own user namespace, the tool has no right to another user's files, even as root.
+// Root may read any file. In a user namespace of its own, the tool does not have this right.
 TEST_F(IncompletePackage, LibraryThatMayNotBeReadIsRefused) {
   if (!CanMakeNamespaces()) GTEST_SKIP() << kNoNamespaces;
   std::filesystem::permissions(library_, std::filesystem::perms::none);

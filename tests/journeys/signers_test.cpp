@@ -1,4 +1,5 @@
-// The signer, in the words that apksigner prints, and the warnings about the signer.
+// Tests two things that the simulator prints: the signer, in the words of apksigner, and the
+// warnings about the signer.
 #include <gtest/gtest.h>
 
 #include <algorithm>

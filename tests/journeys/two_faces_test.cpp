@@ -57,11 +57,12 @@ Package SignedAgain(Package package, Certificate certificate, const OwnKey& key)
   return package;
 }
 
-// Returns a package whose certificate shows the victim's modulus. An exponent of eight bytes makes
-// the tool read 300 bytes, from the start of this modulus, as the modulus of the signer's key. The
-// last of these bytes belong to an extension, and are chosen so that the number is a prime. Anyone
-// can compute the private exponent for a prime modulus, so the author of the package can sign. Sets
-// `*digest` to the SHA-256 digest of this prime.
+// Returns a package whose certificate shows the victim's modulus. The exponent has eight bytes, and
+// the tool takes the last four (2c 01 00 00) as the modulus length: 300 in host byte order. It
+// therefore reads 300 bytes, from the start of the victim's modulus, as the modulus of the signer's
+// key. The last of these bytes belong to an extension, and are chosen so that the number is a
+// prime. Anyone can compute the private exponent for a prime modulus, so the author of the package
+// can sign. Sets `*digest` to the SHA-256 digest of this prime.
 Package WithAPrimeBehindTheVictimsModulus(std::string* digest) {
   constexpr size_t kSize = 300;
   Certificate certificate;

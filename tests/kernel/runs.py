@@ -50,8 +50,10 @@ class Run:
 
     before: a shell command that changes the files before the run, under qemu and in the simulation.
     feature: True if the kernel has the file-integrity feature. mount: how the files are mounted.
-    confined: True if the run is in the tool's SELinux domain on a kernel with a policy. The policy
-    has rules only for regular files. It has no rules for the probe, which no product contains.
+    confined: True if the run is in the tool's SELinux domain on a kernel with a policy. Runs that
+    open a FIFO or a directory are not confined, because the policy has rules only for regular files.
+    Runs of the probe are not confined either: no product contains it, so the policy has no rules for
+    it.
     """
 
     def __init__(self, name, file, *options, program=TOOL, before=None, feature=True, mount="rw",

@@ -1,7 +1,8 @@
 #!/usr/bin/env python3
-"""Writes the file lists of the platform's build from those of CMake. Compares other parts of the
-two builds: the warnings, and the functions that the linker wraps for a test. Also checks that
-Android 8.1 knows every word of the Android.bp files."""
+"""Compares the file lists of the platform's build with those of CMake. With --write, corrects the
+platform's lists. Also compares other parts of the two builds: the warnings, and the functions that
+the linker wraps for a test. Also checks that Android 8.1 knows every word of the Android.bp
+files."""
 
 import json
 import pathlib

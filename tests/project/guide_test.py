@@ -1,9 +1,10 @@
 #!/usr/bin/env python3
-"""Runs the commands that docs/guide.md shows, and writes their output to the page.
+"""Runs the commands that docs/guide.md shows, and compares their output with the page. With
+--write, writes the output to the page instead.
 
-Arguments: the directory of the golden packages, and the command line that starts apktoolkit-sim. A
-last line of three dots on the page stands for the lines that follow. If the page shows only this
-line below a command, the command may print anything.
+Arguments: the directory of the golden packages (tests/journeys/make_golden_packages), and the
+command line that starts apktoolkit-sim. If the last line below a command is three dots, this line
+stands for all further output. If the three dots are the only line, the command may print anything.
 """
 
 import pathlib

@@ -43,8 +43,8 @@ def run(commands, directory, compiler):
 
 
 def page_problems(directory, compiler):
-    # The first command makes a build tree. It is left out, because this test uses the build tree
-    # that it was given.
+    # The first command makes a build tree. This command is left out, because the test uses the
+    # build tree that it was given.
     blocks = re.findall(r"^```\n(\$ .*?)\n```$", (ROOT / "examples/README.md").read_text(), re.M | re.S)
     shown = [command for block in blocks for command in shown_commands(block)][1:]
     printed, problems = run([command for command, _ in shown], directory, compiler)

@@ -43,7 +43,8 @@ def multiply_add_equals_the_wide_product_plus_both_addends():
     halves = {(x, n): (y >> (16 * n)) & HALF for x, y in (("s", s), ("b", b)) for n in (0, 1)}
     products = {}
 
-    # The product of a half of s and a half of b. It may be any number up to the greatest product.
+    # Replaces the product of a half of s and a half of b by an unknown number. The claim is then
+    # proved for each value of this number up to HALF * HALF.
     def product(left, right):
         m = next(n for n in (0, 1) if is_same(left, halves["s", n]))
         n = next(n for n in (0, 1) if is_same(right, halves["b", n]))
@@ -139,9 +140,10 @@ class Montgomery:
 
 
 def windows_make_up_the_exponent():
-    """After every window, and after every zero between windows, the scan is in its first state
-    again. The exponents that are checked here contain each pair of windows, with and without a
-    zero between them. They therefore stand for all exponents. Some windows cross limbs."""
+    """After every window, and after every zero between windows, the loop of `raise` is in its
+    initial state again. The exponents that are checked here contain each pair of windows, with and
+    without a zero between them. They therefore stand for all exponents. In the shifted exponents,
+    some windows cross the border between two limbs."""
     function = load("crypto/mpi_pow_mod.cpp", "raise", kMpiLimbBits=LIMB_BITS,
                     mpi_msb=lambda number: number.value.bit_length())
     for w in (1, 3, 4, 5, 6):

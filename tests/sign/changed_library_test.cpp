@@ -290,7 +290,7 @@ TEST_F(ChangedLibrary, ThatIsLeasedAtItsSecondOpeningIsSigned) {
     return path == target_ && ++asked == 2 ? EWOULDBLOCK : 0;
   };
   ExpectSigned(1);
-  EXPECT_EQ(asked, 3);  // the third open has O_PATH; the fourth has a path in /proc
+  EXPECT_EQ(asked, 3);  // the third has O_PATH; a fourth, by a path in /proc, is not counted
 }
 
 // Before the tool opens the file again, the holder of the lease could put another file in its

@@ -41,8 +41,7 @@ inline LogRecord Starts(int fd) {
 }
 inline LogRecord Finished() { return Info("VeltSignJni finished: 0.\n"); }
 
-// A package in its own directory, opened as main() opens it. `log` has only the messages after the
-// opening.
+// A package in its own directory, open for reading. `log` has only the messages after the opening.
 class PackageOnPhone {
  public:
   explicit PackageOnPhone(const Package& package, const std::string& directory = "")

@@ -210,7 +210,8 @@ TEST(VeltSignJni, AnEntryOfNoRowIsPassedOverWithoutAMessage) {
   EXPECT_EQ(file.log.records(), Records({Starts(file.fd()), Finished()}));
 }
 
-// The zip library decides the order of the two libraries by their names.
+// The order of the two entries in the iteration depends on their names. The loop tries names until
+// each entry has come first.
 TEST(VeltSignJni, ALibraryOfAnotherAbiDoesNotEndTheWalkInEitherOrder) {
   const ZipItem library = Library("lib/arm64-v8a/libfoo.so");
   int first = 0, last = 0;  // how often the other library came first or last
@@ -304,7 +305,7 @@ TEST(VeltSignJni, ALibraryWhoseBytesDifferIsNotSignedAndTheOthersAre) {
   file.Install("lib/arm64/libb.so", {"", ToBytes("\177ELF other bytes")});
   EXPECT_EQ(file.SignJni(), 0U);
   EXPECT_EQ(file.phone.events, Events({kSelf, SignEvent(file.fd() + 1)}));
-  // The zip library decides the order of the two libraries.
+  // Either entry may come first in the zip library's iteration.
   const LogRecord refused =
       Error("VeltSignJni: File not verified: " + file.Path("lib/arm64/libb.so") + "\n");
   const LogRecord signs = Info("VeltSignOat: Apk case.\n");

@@ -1,4 +1,5 @@
-// The exit status of apktoolkit-sim, and the messages that belong to it.
+// The exit status of apktoolkit-sim, and the messages that belong to it. In most tests, the probe
+// (phone/probe.cpp) takes the place of the tool, and executes the commands that the test lists.
 #include <gtest/gtest.h>
 #include <sys/stat.h>
 #include <unistd.h>
@@ -337,8 +338,8 @@ TEST(ExitStatus, TwoWhenTwoOutputsAreOneFile) {
   }
 }
 
-// In one file, this output and the printed lines would overwrite each other. A pipe accepts both in
-// turn.
+// In one file, an output and the printed lines would overwrite each other. In a pipe, they follow
+// each other.
 TEST(ExitStatus, TwoWhenAnOutputIsAlsoStandardOutput) {
   const Probe probe({"sign 3 0000"});
   const auto told = [&probe](const std::string& rest) {
@@ -375,7 +376,8 @@ TEST(ExitStatus, ThreeInEachReportWhenOneOutputCannotBeOpened) {
   EXPECT_EQ(ContentOf(journal), "{\"event\":\"journal\",\"version\":1}\n");
 }
 
-// There is one message per output, and the SARIF log says that the run failed.
+// There is one message for the journal, and not one for each of the three files. The SARIF log also
+// says that the run failed.
 TEST(ExitStatus, ThreeOnceWhenTheDiskIsFull) {
   const Probe probe({"sign 3 0000"});
   const std::string sarif = probe.directory() / "s.sarif";

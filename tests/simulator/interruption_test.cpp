@@ -123,8 +123,8 @@ TEST(Interruption, ByAReaderThatEndsLeavesNothingBehind) {
   EXPECT_TRUE(std::filesystem::is_empty(temporary.path()));
 }
 
-// The simulator continues after such a signal. For example, nohup starts programs that ignore
-// SIGHUP.
+// The simulator continues after a signal that its caller ignores. For example, nohup starts
+// programs that ignore SIGHUP.
 TEST(Interruption, IsNoneByASignalThatTheCallerIgnores) {
   const Probe slow({"sign 3 0000", "pid", "sleep 1"});
   const ProcessResult result = RunProcess(

@@ -1,4 +1,5 @@
-// Runs apktoolkit-sim with the probe or with apktoolkit as the tool.
+// Runs apktoolkit-sim. The simulated tool is apktoolkit, or the probe (simulator/phone/probe.cpp),
+// which executes a test's commands.
 #pragma once
 
 #include <algorithm>

@@ -221,8 +221,8 @@ TEST(Simulation, WorksFromADirectoryThatTheLoaderCannotName) {
                    "  + key  registered for name"}));
 }
 
-// Writes a runner, a program that starts the tool. It first executes the shell command `does`.
-// Returns the runner's path.
+// Writes a runner, a program that starts the tool. The runner first executes the shell command
+// `does`. Returns the runner's path.
 std::string RunnerThat(const std::string& does, const TempDir& directory) {
   return directory.WriteProgram("runner", "#!/bin/sh\n" + does + "\nshift\nexec env \"$@\"\n");
 }

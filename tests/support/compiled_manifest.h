@@ -27,7 +27,7 @@ XmlAttribute ReferenceAttribute(const std::string& name, uint32_t resource);
 XmlAttribute IntAttribute(const std::string& name, uint32_t value);
 // An attribute whose typed value has the type string, but whose text is missing.
 XmlAttribute StringAttributeWithoutText(const std::string& name);
-// The same attribute in Android's namespace.
+// Returns `attribute` in Android's namespace.
 XmlAttribute InAndroidNamespace(XmlAttribute attribute);
 
 class CompiledXml {

@@ -47,7 +47,7 @@ Bytes OctetString(const Bytes& contents);
 Bytes Null();
 // The OBJECT IDENTIFIER with this dotted text.
 Bytes Oid(const std::string& dotted);
-// Only the contents of this element.
+// Only the contents octets of the OBJECT IDENTIFIER.
 Bytes OidContents(const std::string& dotted);
 
 }  // namespace der

@@ -1,6 +1,6 @@
-// Journeys describe the events of one run of the tool on a phone as a timeline: a text with one
-// line for each event, in order. Timelines are joined with `+`, and a difference is shown line by
-// line. Each function below makes the line of one event, with every field of the journal's record
+// Tests describe the events of one run of the tool on a phone as a timeline: a text with one line
+// for each event, in order. Timelines are joined with `+`, and a difference is shown line by line.
+// Each function up to Exit makes the line of one event, with every member of the journal's event
 // (docs/journal.md).
 #pragma once
 
@@ -13,7 +13,7 @@
 std::string Log(int priority, const std::string& text);
 // The tool read its own integrity value and found `text`.
 std::string Integrity(const std::string& text);
-// The same, but there was no such file.
+// The tool tried to read its own integrity value, but the file did not exist.
 std::string IntegrityMissing();
 // The tool asked the kernel to sign the open file `fd`. `refusal` is the errno of the kernel's
 // refusal; 0: the kernel signed.
@@ -32,7 +32,7 @@ std::string Timeline(std::initializer_list<std::string> parts);
 // length 32 as two bytes, low byte first, and the SHA-256 digest of the modulus.
 Bytes PackagePayload(const std::string& key = "rsa-2048");
 
-// The parts that most journeys share.
+// The parts that many tests share.
 
 // The events of VeltSignJni, the step that signs the libraries: its first log record, the events of
 // each library, and its last log record.

@@ -1,4 +1,4 @@
-// Makes one chosen allocation fail, and checks memory that is freed.
+// Makes one chosen allocation fail, and counts the blocks that are freed before they are wiped.
 //
 // A test program linked with -Wl,--wrap=malloc,--wrap=free sends the calls of its own object files
 // here, and this file calls the real functions. The platform's libraries and the sanitizers call

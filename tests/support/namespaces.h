@@ -1,11 +1,11 @@
-// Runs a command with another file system or with other rights than those of the test.
+// Linux namespaces, in which a command has another file system or other rights than the test.
 #pragma once
 
 #include <string>
 #include <vector>
 
-// True if the kernel allows namespaces. If the test runs in a container, the container must allow
-// them as well. Otherwise a test that needs them is skipped with the reason kNoNamespaces.
+// True if user and mount namespaces can be made. The kernel, or a container in which the test runs,
+// may forbid them. A test that needs namespaces is then skipped with the reason kNoNamespaces.
 bool CanMakeNamespaces();
 inline constexpr char kNoNamespaces[] = "the kernel, or this container, allows no user namespaces";
 

@@ -1,5 +1,5 @@
-// Operands for the tests of the integers: made of limbs, drawn at random, and converted to GMP's
-// numbers.
+// Operands for the tests of the large integers in crypto/mpi.h: made of given limbs or drawn at
+// random. Also converts them to GMP's numbers.
 #pragma once
 
 #include <gmpxx.h>
@@ -73,7 +73,7 @@ class Operands {
   std::mt19937 random_;
 };
 
-// The arguments of an operation X = A op B that are the same number.
+// The arguments of an operation X = A op B that are the same object.
 enum Alias { kNone, kXIsA, kXIsB, kAIsB, kAllOne, kAliases };
 
 struct Aliased {

@@ -1,7 +1,7 @@
 # shellcheck shell=bash
 #
-# Recipes for packages and their signers, with the tools that developers use. scripts/demo and
-# tests/journeys/make_golden_packages source this file.
+# Recipes for packages and their signers, with the tools that developers use. scripts/demo,
+# tests/journeys/make_golden_packages and tests/threats/make_threat_packages source this file.
 
 recipes_dir=$(cd "$(dirname "${BASH_SOURCE[0]}")" && pwd)
 

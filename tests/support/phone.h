@@ -20,7 +20,7 @@ struct Phone {
   Phone(const Phone&) = delete;
   Phone& operator=(const Phone&) = delete;
 
-  // The defaults are a healthy phone, and a test changes them.
+  // By default, a phone has no faults. A test changes the members that it needs.
 
   // The texts of the integrity file, one for each opening. The last text repeats. kNoFile means
   // that this opening fails.
@@ -34,7 +34,8 @@ struct Phone {
   // The result of fcntl to sign (if sign_errno is 0) and to verify (if verify_errno is 0).
   int kernel_result = 0;
 
-  // Called before the integrity file is opened: after all checks, and before the kernel signs.
+  // Called before the integrity file is opened. The tool opens it after its checks of a file, and
+  // before the kernel signs the file.
   std::function<void()> before_integrity;
   // Called before each open(), and after each successful one.
   std::function<void(const char* path, int flags)> before_open;

@@ -1,5 +1,4 @@
-// RSA keys with public and private key, a context of crypto/rsa.h for each, and the padded blocks
-// that they sign.
+// RSA key pairs, a context of crypto/rsa.h for each, and the padded blocks that they sign.
 #pragma once
 
 #include <gmpxx.h>
@@ -51,7 +50,7 @@ struct FixedKey {
     return signature;
   }
 
-  // The private operation alone.
+  // Only the private operation: `block` is padded already.
   Bytes SignBlock(const Bytes& block) const {
     Bytes signature(modulus.size());
     size_t size = 0;

@@ -45,5 +45,6 @@ struct SignatureBlock {
 
 // A block over the signature file that anyone can make without the private half of the RSA test key
 // `victim`. It has encoded messages in place of signatures. They count as signatures if the public
-// operation returns its argument. `exponent` is the contents of the exponent INTEGER.
+// operation returns its argument, as it does for the exponent 1. `exponent` is the contents of the
+// exponent INTEGER.
 Bytes ForgedBlock(const Bytes& signature_file, const std::string& victim, const Bytes& exponent);

@@ -18,7 +18,7 @@ inline constexpr uint32_t kSchemeV31 = 0x1b93ad61;
 
 // A signer with this certificate: signed data (no digests, one certificate), no signatures, no key.
 Bytes SignerBytes(const Bytes& certificate);
-// The value of a scheme.
+// The value of a scheme's pair: the list of its signers.
 Bytes Signers(const std::vector<Bytes>& signers);
 // The block of these pairs of scheme and value: size, pairs, size again, magic.
 Bytes SigningBlockBytes(const std::vector<std::pair<uint32_t, Bytes>>& pairs);

@@ -1,5 +1,6 @@
-// Tests attacks with packages that aapt and apksigner made. The install path leaves the check of
-// the JAR signature to this tool (docs/threat-model.md).
+// Tests attacks with packages that aapt and apksigner made. Since Android 7, the installer does not
+// check the JAR signature of a package that has an APK signing block. Only this tool checks it
+// (docs/threat-model.md).
 #include <gtest/gtest.h>
 
 #include <filesystem>
@@ -49,7 +50,7 @@ INSTANTIATE_TEST_SUITE_P(Rsa, KeyOfApksigner,
                                          "rsa-2048-e17", "rsa-2048-other", "rsa-3072", "rsa-4096"),
                          NameOf);
 
-// ---- If a package has an APK signing block, the installer checks that block. Only this tool then
+// ---- If a package has an APK signing block, the installer checks only that block. Only this tool
 // checks META-INF.
 
 class ForeignMetaInf : public testing::TestWithParam<const char*> {

@@ -11,7 +11,7 @@
 
 #include "support/files.h"
 
-// The functions that a test replaces. A function that a test does not set calls the kernel.
+// The functions that a test can replace. If a test does not set a function, the kernel is called.
 struct Kernel {
   std::function<int(struct stat*)> fstat;
   std::function<off_t(int whence)> lseek;

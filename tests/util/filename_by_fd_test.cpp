@@ -87,7 +87,7 @@ TEST_F(GetFilenameByFdTest, TargetPathOf4095BytesIsItsFirst4095Bytes) {
   EXPECT_EQ(deep.path(), GetFilenameByFd(deep.fd()));
 }
 
-// Linux does not return a longer path at all: readlink fails with ENAMETOOLONG.
+// Linux returns no part of a path of more than 4095 bytes: readlink fails with ENAMETOOLONG.
 TEST_F(GetFilenameByFdTest, TargetPathOf4096BytesIsNotToldByTheKernel) {
   const DeepDirectory deep(directory_.path(), 4096);
   ASSERT_NE(-1, deep.fd());

@@ -1,6 +1,7 @@
 // Tests rsa_pkcs1_verify on vectors in the format of Project Wycheproof's
 // rsa_signature_*_test.json: the vectors of this project, those of Wycheproof for SHA-256 and keys
-// of 2048 and 3072 bits, and those in the directory APKTOOLKIT_WYCHEPROOF_DIR of the build.
+// of 2048 and 3072 bits, and those in the directory that the CMake variable
+// APKTOOLKIT_WYCHEPROOF_DIR names.
 #include <gtest/gtest.h>
 #include <openssl/bn.h>
 #include <openssl/nid.h>
@@ -213,8 +214,8 @@ GTEST_ALLOW_UNINSTANTIATED_PARAMETERIZED_TEST(VectorsOfTheDirectory);
 INSTANTIATE_TEST_SUITE_P(Files, VectorsOfTheDirectory, testing::ValuesIn(NamesInTheDirectory()),
                          [](const auto& parameter) { return parameter.param; });
 
-// If this project has a copy of the file's numbers (wycheproof_*.json), take_wycheproof must print
-// exactly this copy.
+// This project has shortened copies of some of these files (wycheproof_*.json). take_wycheproof
+// must print exactly this copy if there is one.
 TEST_P(VectorsOfTheDirectory, AreJudgedAsTheySay) {
   EXPECT_GT(JudgeFile(file_).refused, 0);
   std::string kept = GetParam() + ".json";

@@ -1,4 +1,5 @@
-// The installer's process. The tests put programs of their own in the place of java.
+// Tests how the simulator runs the Java program that judges packages as a phone's installer does.
+// The tests put programs of their own in the place of java.
 #include "simulator/installer/installer.h"
 
 #include <gtest/gtest.h>

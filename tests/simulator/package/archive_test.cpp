@@ -19,7 +19,8 @@ namespace {
 
 using Lines = std::vector<std::string>;
 
-// An entry that the platform's library does not find: its local header has another CRC.
+// An entry that the platform's library does not find, because its local header has another CRC than
+// the central directory.
 ZipItem Damaged(const std::string& name) {
   ZipItem item = {name, ToBytes("data of " + name)};
   item.local.crc = 1;
@@ -131,8 +132,8 @@ TEST(Archive, EntryThatClaimsTooMuchIsDamaged) {
   EXPECT_EQ(archive.too_long(), Lines());
 }
 
-// The central directory is mapped into memory. Its pages after the new end of the file no longer
-// exist.
+// The zip library maps the central directory into memory. When the file shrinks, the pages beyond
+// its new end no longer exist.
 TEST(Archive, SurvivesAFileThatShrinks) {
   std::vector<ZipItem> items;
   for (int i = 0; i < 2000; ++i) items.push_back({"assets/" + std::to_string(i), {}});
@@ -188,9 +189,9 @@ TEST(ArchiveEnd, IsTheLastMarkThatHasRoomForARecord) {
   EXPECT_EQ(end_of(""), 1);
   EXPECT_EQ(end_of("a comment"), 1);
   EXPECT_EQ(end_of(std::string(65535, 'c')), 1);
-  // A mark in the comment does not count as the end if it does not begin a whole record.
+  // This mark in the comment is followed by one byte too few for a record, so it does not count.
   EXPECT_EQ(end_of(std::string("PK\5\6") + std::string(17, '\0')), 1);
-  // A mark that begins a whole record counts as the end, as in the platform's library.
+  // This mark begins a whole record, so it counts as the end, as in the platform's library.
   EXPECT_EQ(end_of(std::string("PK\5\6") + std::string(18, '\0')), 0);
 }
 

@@ -93,7 +93,8 @@ TEST(ToolKey, OfAnEcKeyIsNone) {
   EXPECT_EQ(jar.certificate->key.algorithm, "EC");
 }
 
-// The facts have no certificate if the strict DER parser does not find the tool's certificate.
+// The facts have no certificate if the strict DER parser does not find the certificate that the
+// tool reads.
 TEST(JarSignatureFacts, CertificateThatTheToolDoesNotReadIsNotShown) {
   Package package = MakePackage();
   Bytes& block = package.Item("META-INF/CERT.RSA").data;

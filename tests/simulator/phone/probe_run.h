@@ -1,4 +1,5 @@
-// Runs the probe (probe.cpp) inside the simulated phone.
+// Runs the probe inside the simulated phone. The probe is a program that executes the commands of a
+// file (probe.cpp).
 #pragma once
 
 #include <nlohmann/json.hpp>
@@ -13,7 +14,7 @@ using Json = nlohmann::json;
 struct ProbeRun {
   int status = 0;            // of apktoolkit-sim
   std::string errors;        // the standard error of apktoolkit-sim and of the probe
-  Lines results;             // one per command: "RESULT ERRNO"; errno is 77 before it
+  Lines results;             // "RESULT ERRNO" for each command, which starts with errno 77
   std::vector<Json> events;  // the journal, from the event after "attached" to "exit"
 };
 

@@ -10,7 +10,7 @@ using namespace simulator;
 
 namespace {
 
-// While it lives, the environment has these variables.
+// Sets these environment variables. The destructor removes them.
 class Environment {
  public:
   explicit Environment(const Lines& assignments) {
@@ -54,7 +54,7 @@ TEST(PhoneEnvironment, EverySettingArrives) {
   EXPECT_EQ(phone.zu_result, -3);
 }
 
-// No file has the inode 0.
+// A text without an inode number becomes {0, 0}. No file has the inode 0.
 TEST(PhoneEnvironment, FileThatIsNotNamedByDeviceAndInodeIsNone) {
   const Environment environment({"APKTOOLKIT_SIM_TRUST=5,6:7"});
   EXPECT_EQ(SettingsFromEnvironment().trusted, std::vector<FileId>({{0, 0}, {6, 7}}));

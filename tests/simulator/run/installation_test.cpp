@@ -208,8 +208,8 @@ TEST(Installation, SaysWhenItCannotWrite) {
   EXPECT_EQ(problem_with(3000), "");
 }
 
-// The installation does not wait for the end of the lease. The tool waits, and the report then
-// names the lease.
+// A lease (F_SETLEASE) delays every other open() of the file. The installation does not wait for
+// the end of the lease. The tool waits, and the report then names the lease.
 TEST(Installation, DoesNotWaitForWhoHoldsALease) {
   const TempDir directory;
   const std::string file = directory / "base.apk";

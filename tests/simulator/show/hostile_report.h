@@ -8,7 +8,7 @@
 
 namespace simulator {
 
-// The texts of a hostile file: markup for every place of a page, control sequences, bytes that are
+// The text of a hostile file: markup for every place of a page, control sequences, bytes that are
 // not UTF-8, characters that change the direction of the text, and marks of the page's template.
 inline const char kHostileText[] =
     "</title></style><script>document.title='hostile'</script><img src=x onerror=alert(1)>"
@@ -32,7 +32,7 @@ inline Judgement HostileJudgement(const std::string& text) {
   return judgement;
 }
 
-// An event of each kind.
+// An event of each kind that the timeline shows, and one of an unknown kind.
 inline Events HostileEvents(const std::string& text) {
   const auto answer = [&text](const char* kind, int64_t result) {
     return Event(kind).Text("path", text).Text("payload", text).Number("result", result).Line();

@@ -147,7 +147,8 @@ TEST(Sarif, HostileTextsAreTexts) {
 }
 
 // RFC 3986 §2.3 lists the characters that need no percent-encoding. The "/" of a path is not
-// encoded either. §4.2 says why a colon must be encoded.
+// encoded either. A colon is encoded, because the part before it would otherwise read as the scheme
+// of a URI (§4.2).
 TEST(UriOf, IsAReferenceWhateverTheName) {
   EXPECT_EQ(UriOf("base.apk"), "base.apk");
   EXPECT_EQ(UriOf("../a-b/c_d~e.apk"), "../a-b/c_d~e.apk");

@@ -142,8 +142,8 @@ TEST(MakeReport, LibrariesOfARefusedPackageFollowIt) {
   EXPECT_FALSE(report.items[0].is_verified);
 }
 
-// If the tool may not sign a library, its log names no path. The order of the libraries then shows
-// which library the log is about.
+// If the integrity value forbids the signing of a library, the kernel gets no request, and the
+// tool's log names no path. The order of the libraries then shows which library the log is about.
 TEST(MakeReport, LibrariesThatTheKernelWasNotAskedForAreKnownByTheirOrder) {
   const PackageFacts facts = WithLibraries({"lib/arm64-v8a/liba.so", "lib/arm64-v8a/libb.so"});
   const Report report =
