@@ -55,7 +55,7 @@ bool Asks(const std::string& element, const std::vector<XmlAttribute>& attribute
 
 // ---- The package's name.
 
-TEST(AndroidManifestPackage, TheNameIsTheManifestsAttributeInEitherEncoding) {
+TEST(AndroidManifestPackage, NameIsReadFromUtf8AndUtf16) {
   for (const auto pool : {CompiledXml::Pool::kUtf8, CompiledXml::Pool::kUtf16}) {
     EXPECT_EQ(Read(CompiledXml(pool).Element("manifest",
                                              {Package("com.example.\u00fc\u20ac\U0001f600")})),
@@ -63,33 +63,33 @@ TEST(AndroidManifestPackage, TheNameIsTheManifestsAttributeInEitherEncoding) {
   }
 }
 
-TEST(AndroidManifestPackage, ALongNameIsReadWhole) {
+TEST(AndroidManifestPackage, LongNameIsReadWhole) {
   const std::string name(300, 'n');
   for (const auto pool : {CompiledXml::Pool::kUtf8, CompiledXml::Pool::kUtf16}) {
     EXPECT_EQ(Read(CompiledXml(pool).Element("manifest", {Package(name)})), (Facts{name, false}));
   }
 }
 
-TEST(AndroidManifestPackage, ASecondManifestSuppliesWhatTheFirstLacks) {
+TEST(AndroidManifestPackage, SecondManifestSuppliesTheNameThatTheFirstLacks) {
   EXPECT_EQ(Read(CompiledXml()
                      .Element("manifest", {ReferenceAttribute("package", 0x7f010001)})
                      .Element("manifest", {Package("second")})),
             (Facts{"second", false}));
 }
 
-TEST(AndroidManifestPackage, AnEmptyNameLeavesRoomForASecondManifest) {
+TEST(AndroidManifestPackage, EmptyNameIsReplacedByTheSecondManifestsName) {
   EXPECT_EQ(
       Read(CompiledXml().Element("manifest", {Package("")}).Element("manifest", {Package("b")})),
       (Facts{"b", false}));
 }
 
-TEST(AndroidManifestPackage, TheFirstManifestWithANameWins) {
+TEST(AndroidManifestPackage, FirstManifestWithANameWins) {
   EXPECT_EQ(
       Read(CompiledXml().Element("manifest", {Package("a")}).Element("manifest", {Package("b")})),
       (Facts{"a", false}));
 }
 
-TEST(AndroidManifestPackage, AManifestCountsAtAnyDepth) {
+TEST(AndroidManifestPackage, ManifestInsideOtherElementsIsFound) {
   EXPECT_EQ(Read(CompiledXml()
                      .Start("root")
                      .Start("inner")
@@ -100,28 +100,28 @@ TEST(AndroidManifestPackage, AManifestCountsAtAnyDepth) {
             (Facts{"deep", false}));
 }
 
-TEST(AndroidManifestPackage, AReferenceIsNotAName) {
+TEST(AndroidManifestPackage, ReferenceIsNotAName) {
   EXPECT_EQ(Read(CompiledXml().Element("manifest", {ReferenceAttribute("package", 0x7f010001)})),
             (Facts{"", false}));
 }
 
-TEST(AndroidManifestPackage, AnIntegerIsNotAName) {
+TEST(AndroidManifestPackage, IntegerIsNotAName) {
   EXPECT_EQ(Read(CompiledXml().Element("manifest", {IntAttribute("package", 17)})),
             (Facts{"", false}));
 }
 
-TEST(AndroidManifestPackage, OtherLetterCaseIsAnotherElementOrAttribute) {
+TEST(AndroidManifestPackage, ElementAndAttributeNamesAreCaseSensitive) {
   EXPECT_EQ(Read(CompiledXml()
                      .Element("Manifest", {Package("a")})
                      .Element("manifest", {StringAttribute("Package", "b")})),
             (Facts{"", false}));
 }
 
-TEST(AndroidManifestPackage, ADocumentWithoutManifestHasNoName) {
+TEST(AndroidManifestPackage, DocumentWithoutManifestHasNoName) {
   EXPECT_EQ(Read(CompiledXml().Element("resources")), (Facts{"", false}));
 }
 
-TEST(AndroidManifestPackage, AnEmptyNameReplacesAnEarlierOne) {
+TEST(AndroidManifestPackage, SecondDocumentWithoutNameClearsTheName) {
   LogCapture log;
   Apk apk(-1);
   ASSERT_TRUE(apk.ParseAndroidManifest(CompiledManifest("first")));
@@ -130,7 +130,7 @@ TEST(AndroidManifestPackage, AnEmptyNameReplacesAnEarlierOne) {
   EXPECT_EQ(apk.GetPackageName(), "");
 }
 
-TEST(AndroidManifestPackage, ANulInsideTheNameIsPartOfIt) {
+TEST(AndroidManifestPackage, NulInsideTheNameIsKept) {
   const std::string name("com\0example", 11);
   for (const auto pool : {CompiledXml::Pool::kUtf8, CompiledXml::Pool::kUtf16}) {
     EXPECT_EQ(Read(CompiledXml(pool).Element("manifest", {Package(name)})), (Facts{name, false}));
@@ -139,13 +139,13 @@ TEST(AndroidManifestPackage, ANulInsideTheNameIsPartOfIt) {
 
 // ---- The secure-storage permission.
 
-TEST(AndroidManifestPermission, AUsesPermissionAsksUnderEitherName) {
+TEST(AndroidManifestPermission, UsesPermissionElementAsksWithEitherName) {
   EXPECT_TRUE(Asks("uses-permission", {AndroidName(kPermission)}));
   EXPECT_TRUE(Asks("uses-permission", {AndroidName(kOtherPermission)}));
   EXPECT_FALSE(Asks("uses-permission", {AndroidName("android.permission.INTERNET")}));
 }
 
-TEST(AndroidManifestPermission, ALonePermissionElementAsks) {
+TEST(AndroidManifestPermission, PermissionElementAsksWithEitherName) {
   EXPECT_TRUE(Asks("permission", {AndroidName(kPermission)}));
   EXPECT_TRUE(Asks("permission", {AndroidName(kOtherPermission)}));
   EXPECT_FALSE(Asks("permission", {AndroidName("com.example.OWN")}));
@@ -157,13 +157,13 @@ TEST(AndroidManifestPermission, OtherElementsDoNotAsk) {
   EXPECT_FALSE(Asks("service", {AndroidName(kPermission)}));
 }
 
-TEST(AndroidManifestPermission, NamesAreCaseSensitiveAndWhole) {
+TEST(AndroidManifestPermission, NamesMustMatchExactly) {
   EXPECT_FALSE(Asks("uses-permission", {AndroidName("com.qix.android.Secure_Storage")}));
   EXPECT_FALSE(Asks("uses-permission", {AndroidName("com.qix.android.SECURE_STORAGE2")}));
   EXPECT_FALSE(Asks("uses-permission", {AndroidName("com.qix.android.SECURE_STORAG")}));
 }
 
-TEST(AndroidManifestPermission, ANulDoesNotEndAName) {
+TEST(AndroidManifestPermission, NulDoesNotEndAName) {
   EXPECT_FALSE(
       Asks("uses-permission", {AndroidName(std::string(kPermission) + std::string("\0x", 2))}));
   EXPECT_FALSE(Asks("uses-permission", {AndroidName(std::string(kPermission) + '\0')}));
@@ -171,7 +171,7 @@ TEST(AndroidManifestPermission, ANulDoesNotEndAName) {
   EXPECT_FALSE(Asks("uses-permission", {StringAttribute(std::string("name\0", 5), kPermission)}));
 }
 
-TEST(AndroidManifestPermission, MetaDataAsksWithAccessAndItsValue) {
+TEST(AndroidManifestPermission, MetaDataWithAccessAndSsMetaAsks) {
   EXPECT_TRUE(Asks("meta-data", {AndroidName("access"), AndroidValue("SS_META")}));
   EXPECT_TRUE(Asks("meta-data", {AndroidValue("SS_META"), AndroidName("access")}));
 }
@@ -192,7 +192,7 @@ TEST(AndroidManifestPermission, MetaDataWithAPermissionsNameDoesNotAsk) {
   EXPECT_FALSE(Asks("meta-data", {AndroidName(kPermission)}));
 }
 
-TEST(AndroidManifestPermission, ItStaysSetOnceItIsSet) {
+TEST(AndroidManifestPermission, IsNotClearedByLaterElements) {
   EXPECT_EQ(Read(CompiledXml()
                      .Element("uses-permission", {AndroidName(kPermission)})
                      .Element("uses-permission", {AndroidName("android.permission.INTERNET")})
@@ -210,18 +210,18 @@ TEST(AndroidManifestAttribute, NamesMatchInAnyNamespace) {
   EXPECT_TRUE(Asks("uses-permission", {other}));
 }
 
-TEST(AndroidManifestAttribute, TheFirstStringOfTheNameIsTaken) {
+TEST(AndroidManifestAttribute, FirstOfTwoStringsWithTheNameIsUsed) {
   EXPECT_EQ(Read(CompiledXml().Element("manifest", {Package("a"), Package("b")})),
             (Facts{"a", false}));
 }
 
-TEST(AndroidManifestAttribute, AReferenceIsPassedOverForALaterString) {
+TEST(AndroidManifestAttribute, ReferenceBeforeAStringIsSkipped) {
   EXPECT_EQ(Read(CompiledXml().Element("manifest",
                                        {ReferenceAttribute("package", 0x7f010001), Package("b")})),
             (Facts{"b", false}));
 }
 
-TEST(AndroidManifestAttribute, AStringWithoutTextIsPassedOverForALaterString) {
+TEST(AndroidManifestAttribute, StringWithoutTextBeforeAnotherStringIsSkipped) {
   EXPECT_EQ(Read(CompiledXml().Element("manifest",
                                        {StringAttributeWithoutText("package"), Package("b")})),
             (Facts{"b", false}));
@@ -229,7 +229,7 @@ TEST(AndroidManifestAttribute, AStringWithoutTextIsPassedOverForALaterString) {
 
 // An attribute's raw value is its text in the source. The typed value was compiled from this text.
 // Only the typed value counts.
-TEST(AndroidManifestAttribute, AnAttributeOfAnotherTypeIsMissingEvenWithARawText) {
+TEST(AndroidManifestAttribute, RawTextOfReferenceOrIntegerIsIgnored) {
   for (XmlAttribute attribute :
        {ReferenceAttribute("package", 0x7f010000), IntAttribute("package", 7)}) {
     attribute.has_raw = true;
@@ -238,14 +238,14 @@ TEST(AndroidManifestAttribute, AnAttributeOfAnotherTypeIsMissingEvenWithARawText
   }
 }
 
-TEST(AndroidManifestAttribute, AnAttributeWithoutANameIsPassedOver) {
+TEST(AndroidManifestAttribute, AttributeWithoutNameIsSkipped) {
   XmlAttribute nameless = Package("wrong");
   nameless.has_name = false;
   EXPECT_EQ(Read(CompiledXml().Element("manifest", {nameless, Package("right")})),
             (Facts{"right", false}));
 }
 
-TEST(AndroidManifestAttribute, ALoneStringWithoutTextIsMissing) {
+TEST(AndroidManifestAttribute, LoneStringWithoutTextCountsAsMissing) {
   EXPECT_EQ(Read(CompiledXml().Element("manifest", {StringAttributeWithoutText("package")})),
             (Facts{"", false}));
 }
@@ -267,7 +267,7 @@ std::string Converted(const std::string& text) {
   return Read(xml.Element("manifest", {Package(text)})).package_name;
 }
 
-TEST(AndroidManifestSurrogates, AreDroppedFromNamesAndValuesAsByTheConversion) {
+TEST(AndroidManifestSurrogates, AreDroppedFromNamesAndValuesOnlyIfUnpaired) {
   const std::string pair = "\U00010000";
   for (const std::string& before : {kHigh, kLow, kHigh + kHigh, kLow + kHigh, kHigh + pair, pair}) {
     for (const size_t at : {0, 3, 15}) {
@@ -286,7 +286,7 @@ TEST(AndroidManifestSurrogates, AreDroppedFromNamesAndValuesAsByTheConversion) {
   }
 }
 
-TEST(AndroidManifestSurrogates, AShorterNameDoesNotMatchWithAnyNumberOfThem) {
+TEST(AndroidManifestSurrogates, DoNotMakeAShorterNameMatch) {
   CompiledXml xml(CompiledXml::Pool::kUtf16);
   xml.Element("manifes" + kHigh + kHigh, {Package("p")});
   EXPECT_EQ(Read(xml), (Facts{"", false}));
@@ -294,7 +294,7 @@ TEST(AndroidManifestSurrogates, AShorterNameDoesNotMatchWithAnyNumberOfThem) {
 
 // A name with more than 16 unpaired surrogates does not match. Without this limit, each comparison
 // could read all text of a hostile document.
-TEST(AndroidManifestSurrogates, MoreThanSixteenMakeAnotherName) {
+TEST(AndroidManifestSurrogates, PreventAMatchIfThereAreMoreThan16) {
   for (const size_t count : {16, 17}) {
     CompiledXml xml(CompiledXml::Pool::kUtf16);
     xml.Element("manifest" + Times(count, kLow), {Package("p")});
@@ -302,13 +302,13 @@ TEST(AndroidManifestSurrogates, MoreThanSixteenMakeAnotherName) {
   }
 }
 
-TEST(AndroidManifestSurrogates, APackageNameOfNothingElseLeavesRoomForASecondManifest) {
+TEST(AndroidManifestSurrogates, PackageNameOfSurrogatesAloneCountsAsEmpty) {
   CompiledXml xml(CompiledXml::Pool::kUtf16);
   xml.Element("manifest", {Package(Times(40, kHigh))}).Element("manifest", {Package("b")});
   EXPECT_EQ(Read(xml), (Facts{"b", false}));
 }
 
-TEST(AndroidManifestSurrogates, APackageNameLosesAnyNumberOfThem) {
+TEST(AndroidManifestSurrogates, AllAreDroppedFromThePackageName) {
   CompiledXml xml(CompiledXml::Pool::kUtf16);
   xml.Element("manifest", {Package(Times(40, kHigh) + "a" + Times(40, kLow))});
   EXPECT_EQ(Read(xml), (Facts{"a", false}));
@@ -316,7 +316,7 @@ TEST(AndroidManifestSurrogates, APackageNameLosesAnyNumberOfThem) {
 
 // ---- Malformed documents.
 
-TEST(AndroidManifestDocument, BytesThatAreNotCompiledXmlFail) {
+TEST(AndroidManifestDocument, BytesThatAreNotCompiledXmlAreReported) {
   LogCapture log;
   Apk apk(-1);
   ASSERT_TRUE(apk.ParseAndroidManifest(CompiledManifest("before", true)));
@@ -329,7 +329,7 @@ TEST(AndroidManifestDocument, BytesThatAreNotCompiledXmlFail) {
   EXPECT_TRUE(apk.IsSsPermissionRequired());
 }
 
-TEST(AndroidManifestDocument, NoBytesAtAllFail) {
+TEST(AndroidManifestDocument, EmptyDocumentIsReported) {
   LogCapture log;
   Apk apk(-1);
   log.Clear();
@@ -338,7 +338,7 @@ TEST(AndroidManifestDocument, NoBytesAtAllFail) {
                                           "error=0x80000001\n")}));
 }
 
-TEST(AndroidManifestDocument, OneThatTurnsBadAfterTheManifestTagKeepsTheName) {
+TEST(AndroidManifestDocument, KeepsTheNameReadBeforeABadNode) {
   EXPECT_EQ(Read(CompiledXml()
                      .Start("manifest", {Package("found")})
                      .BadNode()
@@ -346,7 +346,7 @@ TEST(AndroidManifestDocument, OneThatTurnsBadAfterTheManifestTagKeepsTheName) {
             (Facts{"found", false}));
 }
 
-TEST(AndroidManifestDocument, OneThatTurnsBadAfterThePermissionKeepsIt) {
+TEST(AndroidManifestDocument, KeepsThePermissionReadBeforeABadNode) {
   EXPECT_EQ(Read(CompiledXml()
                      .Element("uses-permission", {AndroidName(kPermission)})
                      .BadNode()
@@ -364,7 +364,7 @@ Bytes CutTo(size_t length, const Bytes& document) {
   return cut;
 }
 
-TEST(AndroidManifestDocument, OneThatIsCutShortAnywhereIsReadOrRefusedWithoutHarm) {
+TEST(AndroidManifestDocument, IsReadOrReportedIfCutToAnyLength) {
   const Bytes whole = CompiledManifest("com.example.app", true);
   LogCapture log;
   size_t read = 0;
@@ -390,7 +390,7 @@ Bytes Replaced(Bytes document, const Bytes& old_bytes, const Bytes& new_bytes) {
 
 // The changed document claims a length of 9 for the name "manifest", and no NUL follows the ninth
 // byte. The platform's library then returns the name's length but no text.
-TEST(AndroidManifestDocument, AnElementWhoseNameDoesNotEndIsPassedOver) {
+TEST(AndroidManifestDocument, ElementWhoseNameDoesNotEndIsSkipped) {
   CompiledXml xml;
   xml.Element("manifest", {Package("a")}).Element("permission", {AndroidName(kPermission)});
   const Bytes bad = Replaced(xml.Build(), {8, 8, 'm', 'a'}, {8, 9, 'm', 'a'});
@@ -401,12 +401,12 @@ TEST(AndroidManifestDocument, AnElementWhoseNameDoesNotEndIsPassedOver) {
   EXPECT_TRUE(apk.IsSsPermissionRequired());
 }
 
-TEST(AndroidManifestDocument, AnElementWithoutNameIsPassedOver) {
+TEST(AndroidManifestDocument, ElementWithoutNameIsSkipped) {
   EXPECT_EQ(Read(CompiledXml().StartWithoutName().Element("manifest", {Package("p")})),
             (Facts{"p", false}));
 }
 
-TEST(AndroidManifestDocument, ANamespaceWithoutUriIsPassedOver) {
+TEST(AndroidManifestDocument, NamespaceWithoutUriIsSkipped) {
   EXPECT_EQ(Read(CompiledXml().StartNamespaceWithoutUri().Element("manifest", {Package("p")})),
             (Facts{"p", false}));
 }

@@ -49,7 +49,7 @@ PackageOptions WithoutDexListedBy(const std::string& text) {
 
 // ---- The flags after Init: one test for each step that Init can reach.
 
-TEST(ApkInit, WithoutDescriptorAndPathAllFlagsAreFalse) {
+TEST(ApkInit, AllFlagsAreFalseWithoutDescriptorAndPath) {
   LogCapture log;
   Apk apk(-1);
   EXPECT_EQ(log.records(),
@@ -60,7 +60,7 @@ TEST(ApkInit, WithoutDescriptorAndPathAllFlagsAreFalse) {
 }
 
 // A number below -1 does not name a descriptor either.
-TEST(ApkInit, ANegativeDescriptorWithoutAPathIsRefused) {
+TEST(ApkInit, DescriptorBelowMinusOneWithoutPathIsRefused) {
   LogCapture log;
   Apk apk(-1);
   log.Clear();
@@ -71,7 +71,7 @@ TEST(ApkInit, ANegativeDescriptorWithoutAPathIsRefused) {
   EXPECT_EQ(StateOf(apk), (State{false, false, false, false}));
 }
 
-TEST(ApkInit, AFileThatIsNotAZipLeavesANullHandle) {
+TEST(ApkInit, FileThatIsNotAZipIsReported) {
   LogCapture log;
   OpenPackage no_zip(ToBytes("This is not a zip archive, but a text."));
   const std::string fd = std::to_string(no_zip.file.fd());
@@ -80,7 +80,7 @@ TEST(ApkInit, AFileThatIsNotAZipLeavesANullHandle) {
   EXPECT_EQ(StateOf(no_zip.apk), (State{false, false, false, false}));
 }
 
-TEST(ApkInit, AJarIsAGoodZipWhoseSignatureIsNotExamined) {
+TEST(ApkInit, JarIsAGoodZipAndItsSignatureIsNotExamined) {
   Package jar = MakePackage(PlainJar());
   jar.Tamper("META-INF/CERT.SF");
   LogCapture log;
@@ -90,7 +90,7 @@ TEST(ApkInit, AJarIsAGoodZipWhoseSignatureIsNotExamined) {
   EXPECT_TRUE(open.apk.GetManufacturerKey().empty());
 }
 
-TEST(ApkInit, APackageThatDoesNotVerifyIsAPackageThatIsNotGood) {
+TEST(ApkInit, TamperedPackageIsAnApkButNotGood) {
   Package package = MakePackage(WithoutDex());
   package.Tamper(kManifestName);
   LogCapture log;
@@ -98,7 +98,7 @@ TEST(ApkInit, APackageThatDoesNotVerifyIsAPackageThatIsNotGood) {
   EXPECT_EQ(StateOf(open.apk), (State{true, true, false, true}));
 }
 
-TEST(ApkInit, AGoodPackageHasAllFlagsAndNoMessage) {
+TEST(ApkInit, GoodPackageHasAllFlagsAndLogsNothing) {
   LogCapture log;
   OpenPackage open(WithoutDex());
   EXPECT_EQ(log.records(), Records());
@@ -110,13 +110,13 @@ TEST(ApkInit, AGoodPackageHasAllFlagsAndNoMessage) {
 
 // ---- Descriptor and path.
 
-TEST(ApkInit, ThePathIsTheOneThatTheDescriptorResolvesTo) {
+TEST(ApkInit, PathIsResolvedFromTheDescriptor) {
   OpenPackage open(WithoutDex());
   EXPECT_EQ(open.apk.GetPath(), open.file.path());
   EXPECT_EQ(open.apk.GetFd(), open.file.fd());
 }
 
-TEST(ApkInit, AGivenPathIsKeptBesideTheDescriptor) {
+TEST(ApkInit, GivenPathAndDescriptorAreBothKept) {
   LogCapture log;
   Apk apk(-1);
   MemoryFile file(MakePackage(WithoutDex()).Build());
@@ -126,7 +126,7 @@ TEST(ApkInit, AGivenPathIsKeptBesideTheDescriptor) {
   EXPECT_EQ(StateOf(apk), (State{true, true, true, true}));
 }
 
-TEST(ApkInit, WithAPathAloneTheFileIsOpened) {
+TEST(ApkInit, PathWithoutDescriptorIsOpened) {
   LogCapture log;
   Apk apk(-1);
   log.Clear();
@@ -140,7 +140,7 @@ TEST(ApkInit, WithAPathAloneTheFileIsOpened) {
   EXPECT_EQ(StateOf(apk), (State{true, true, true, true}));
 }
 
-TEST(ApkInit, APathThatCannotBeOpenedIsReported) {
+TEST(ApkInit, PathThatCannotBeOpenedIsReported) {
   LogCapture log;
   Apk apk(-1);
   log.Clear();
@@ -196,7 +196,7 @@ TEST(ApkInit, DescriptorZeroThatWasGivenIsUsed) {
   EXPECT_TRUE(apk.IsGoodZip());
 }
 
-TEST(ApkInit, AnyOtherNegativeDescriptorIsUsedUnchangedWhenThereIsAPath) {
+TEST(ApkInit, DescriptorBelowMinusOneWithPathIsUsedUnchanged) {
   DiskFile file(MakePackage(WithoutDex()).Build());
   LogCapture log;
   Apk apk(-1);
@@ -207,13 +207,13 @@ TEST(ApkInit, AnyOtherNegativeDescriptorIsUsedUnchangedWhenThereIsAPath) {
   EXPECT_EQ(apk.GetFd(), -2);
 }
 
-TEST(ApkInit, TheCallersDescriptorStaysOpen) {
+TEST(ApkInit, CallersDescriptorStaysOpen) {
   MemoryFile file(MakePackage(WithoutDex()).Build());
   static_cast<void>(Apk(file.fd()));  // constructed and destroyed
   EXPECT_NE(fcntl(file.fd(), F_GETFD), -1);
 }
 
-TEST(ApkInit, ASecondInitStartsFromClearedFlags) {
+TEST(ApkInit, SecondInitClearsTheFlags) {
   PackageOptions options = WithoutDex();
   options.secure_storage = true;
   OpenPackage open(options);
@@ -227,14 +227,14 @@ TEST(ApkInit, ASecondInitStartsFromClearedFlags) {
   EXPECT_FALSE(open.apk.IsSsPermissionRequired());
 }
 
-TEST(ApkInit, ASecondInitThatGetsNoFileHasNoArchive) {
+TEST(ApkInit, SecondInitWithoutAFileHasNoArchive) {
   OpenPackage open(WithoutDex());
   LogCapture log;
   open.apk.Init(-1, nullptr);
   EXPECT_EQ(StateOf(open.apk), (State{false, false, false, false}));
 }
 
-TEST(ApkInit, ASecondInitForgetsThatTheFirstOnesDexWasGood) {
+TEST(ApkInit, SecondInitForgetsThatTheFirstDexWasGood) {
   OpenPackage open{PackageOptions()};
   ASSERT_TRUE(open.apk.IsGoodApk());
   Package bad = MakePackage();
@@ -246,7 +246,7 @@ TEST(ApkInit, ASecondInitForgetsThatTheFirstOnesDexWasGood) {
   EXPECT_EQ(log.records(), Records({Error("Integrity not confirmed: classes.dex\n")}));
 }
 
-TEST(ApkInit, ASecondInitForgetsTheFirstOnesDigests) {
+TEST(ApkInit, SecondInitForgetsTheFirstDigests) {
   PackageOptions first = WithoutDex();
   first.entries.push_back({"lib/only.so", ToBytes("only")});
   OpenPackage open(first);
@@ -261,7 +261,7 @@ TEST(ApkInit, ASecondInitForgetsTheFirstOnesDigests) {
 }
 
 // The verification of the second package fails after its META-INF/MANIFEST.MF was loaded.
-TEST(ApkInit, ASecondInitThatFailsAfterLoadingItsManifestHasNoDigests) {
+TEST(ApkInit, SecondInitThatFailsAfterLoadingItsManifestHasNoDigests) {
   PackageOptions first = WithoutDex();
   first.entries.push_back({"lib/only.so", ToBytes("only")});
   OpenPackage open(first);
@@ -284,7 +284,7 @@ TEST(ApkInit, ASecondInitThatFailsAfterLoadingItsManifestHasNoDigests) {
 
 // ---- The verification of a package, step by step.
 
-TEST(ApkInit, APackageWithoutManifestIsNotGoodAndLogsNothing) {
+TEST(ApkInit, PackageWithoutManifestIsNotGoodAndLogsNothing) {
   Package package = MakePackage(WithoutDex());
   package.Remove(kManifestName);
   LogCapture log;
@@ -295,7 +295,7 @@ TEST(ApkInit, APackageWithoutManifestIsNotGoodAndLogsNothing) {
 
 // META-INF/MANIFEST.MF is read first. If it is missing, nothing is logged about the signature file
 // and the signature block.
-TEST(ApkInit, APackageWithoutManifestAndBlockLogsNothing) {
+TEST(ApkInit, PackageWithoutManifestAndBlockLogsNothing) {
   Package package = MakePackage(WithoutDex());
   package.Remove(kManifestName);
   package.Remove("META-INF/CERT.RSA");
@@ -305,7 +305,7 @@ TEST(ApkInit, APackageWithoutManifestAndBlockLogsNothing) {
   EXPECT_EQ(StateOf(open.apk), (State{true, true, false, true}));
 }
 
-TEST(ApkInit, TheNameOfTheManifestIsReadThroughItsPointer) {
+TEST(ApkInit, ManifestNameIsReadThroughItsPointer) {
   Package package = MakePackage(WithoutDex());
   package.Item(kManifestName).name = "META-INF/OTHER.MF";
   const char* const usual = Apk::kMANIFEST_MF;
@@ -318,7 +318,7 @@ TEST(ApkInit, TheNameOfTheManifestIsReadThroughItsPointer) {
   EXPECT_FALSE(usually.apk.IsGoodApk());
 }
 
-TEST(ApkInit, ATamperedManifestIsReportedTwice) {
+TEST(ApkInit, TamperedManifestIsReportedTwice) {
   Package package = MakePackage(WithoutDex());
   package.Tamper(kManifestName);
   LogCapture log;
@@ -328,7 +328,7 @@ TEST(ApkInit, ATamperedManifestIsReportedTwice) {
   EXPECT_EQ(StateOf(open.apk), (State{true, true, false, true}));
 }
 
-TEST(ApkInit, AManifestThatCannotBeParsedIsReportedWithItsSize) {
+TEST(ApkInit, ManifestThatCannotBeParsedIsReportedWithItsSize) {
   LogCapture log;
   OpenPackage open(WithoutDexListedBy("Key:x"));
   EXPECT_EQ(log.records(),
@@ -337,7 +337,7 @@ TEST(ApkInit, AManifestThatCannotBeParsedIsReportedWithItsSize) {
   EXPECT_EQ(StateOf(open.apk), (State{true, true, false, true}));
 }
 
-TEST(ApkInit, TheManifestTextHoldsItsNulBytes) {
+TEST(ApkInit, ManifestTextKeepsItsNulBytes) {
   LogCapture log;
   OpenPackage open(WithoutDexListedBy(std::string("A: 1\r\n\r\nB\0C: 2\r\n\r\n", 19)));
   EXPECT_EQ(log.records(),
@@ -345,7 +345,7 @@ TEST(ApkInit, TheManifestTextHoldsItsNulBytes) {
                      Error("Can't load manifest: size=19\n")}));
 }
 
-TEST(ApkInit, AnAndroidManifestThatIsNotCompiledXmlIsReported) {
+TEST(ApkInit, AndroidManifestThatIsNotCompiledXmlIsReported) {
   PackageOptions options = WithoutDex();
   options.android_manifest = ToBytes("<manifest package='com.example.app'/>");
   LogCapture log;
@@ -356,7 +356,7 @@ TEST(ApkInit, AnAndroidManifestThatIsNotCompiledXmlIsReported) {
 }
 
 // AndroidManifest.xml is read only after META-INF/MANIFEST.MF was loaded.
-TEST(ApkInit, AnAndroidManifestIsReadOnlyAfterTheManifestWasLoaded) {
+TEST(ApkInit, AndroidManifestIsNotReadIfTheManifestCannotBeParsed) {
   PackageOptions options = WithoutDexListedBy("Key:x");
   options.secure_storage = true;
   LogCapture log;
@@ -366,7 +366,7 @@ TEST(ApkInit, AnAndroidManifestIsReadOnlyAfterTheManifestWasLoaded) {
   EXPECT_FALSE(open.apk.IsSsPermissionRequired());
 }
 
-TEST(ApkInit, APackageWithoutANameIsGood) {
+TEST(ApkInit, PackageWithoutANameIsGood) {
   PackageOptions options = WithoutDex();
   options.package_name = "";
   LogCapture log;
@@ -375,7 +375,7 @@ TEST(ApkInit, APackageWithoutANameIsGood) {
   EXPECT_EQ(open.apk.GetPackageName(), "");
 }
 
-TEST(ApkInit, AManifestWithoutSectionsMakesAGoodPackage) {
+TEST(ApkInit, PackageWhoseManifestHasNoSectionsIsGood) {
   OpenPackage open(WithoutDexListedBy(""));
   EXPECT_EQ(StateOf(open.apk), (State{true, true, true, true}));
 }
@@ -396,13 +396,13 @@ JarText TwoDigests(const std::string& sha1_of, const std::string& sha256_of) {
       .EndSection();
 }
 
-TEST(ApkDigests, OfTwoDigestsInASectionSha1IsRecorded) {
+TEST(ApkDigests, Sha1IsUsedIfASectionAlsoHasSha256) {
   DiskFile disk(ToBytes("right"));
   OpenPackage open(WithSections(TwoDigests("right", "wrong")));
   EXPECT_TRUE(open.apk.VerifyFileHash("a", disk.path()));
 }
 
-TEST(ApkDigests, OfTwoDigestsInASectionSha256IsNotConsulted) {
+TEST(ApkDigests, Sha256IsIgnoredIfASectionAlsoHasSha1) {
   DiskFile disk(ToBytes("right"));
   OpenPackage open(WithSections(TwoDigests("wrong", "right")));
   EXPECT_FALSE(open.apk.VerifyFileHash("a", disk.path()));

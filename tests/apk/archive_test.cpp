@@ -26,7 +26,7 @@ std::vector<std::string> NamesIn(Apk& apk, const std::string& prefix, const std:
 
 // ---- Iteration.
 
-TEST(ApkIteration, TwoEmptyTextsIterateOverAllEntries) {
+TEST(ApkIteration, EmptyPrefixAndSuffixSelectAllEntries) {
   OpenPackage open(WithoutDex());
   EXPECT_EQ(
       NamesIn(open.apk, "", ""),
@@ -34,7 +34,7 @@ TEST(ApkIteration, TwoEmptyTextsIterateOverAllEntries) {
                                 "META-INF/MANIFEST.MF", "lib/arm64-v8a/libfoo.so"}));
 }
 
-TEST(ApkIteration, PrefixAndSuffixFilter) {
+TEST(ApkIteration, PrefixAndSuffixSelectEntries) {
   OpenPackage open(WithoutDex());
   EXPECT_EQ(NamesIn(open.apk, "META-INF/", ".SF"), (std::vector<std::string>{"META-INF/CERT.SF"}));
   EXPECT_EQ(NamesIn(open.apk, "lib/", ""), (std::vector<std::string>{"lib/arm64-v8a/libfoo.so"}));
@@ -56,7 +56,7 @@ TEST(ApkIteration, NextAtTheEndLeavesTheNameAsItWas) {
   open.apk.EndIteration(cookie);
 }
 
-TEST(ApkIteration, AFilterThatNoNameCanHaveIsAnInvalidName) {
+TEST(ApkIteration, FilterOf65536BytesIsAnInvalidName) {
   LogCapture log;
   OpenPackage open(BuildZip({{"a", ToBytes("a")}}));
   void* cookie;
@@ -80,7 +80,7 @@ ZipItem AndroidManifestItem(bool deflated) {
   return {kAndroidManifestName, CompiledManifest("com.example.app"), deflated};
 }
 
-TEST(ApkEntries, ADeflatedAndroidManifestIsRead) {
+TEST(ApkEntries, DeflatedAndroidManifestWithDataDescriptorIsRead) {
   PackageOptions options = WithoutDex();
   Package package = MakePackage(options);
   package.Item(kAndroidManifestName).deflated = true;
@@ -90,7 +90,7 @@ TEST(ApkEntries, ADeflatedAndroidManifestIsRead) {
   EXPECT_EQ(open.apk.GetPackageName(), "com.example.app");
 }
 
-TEST(ApkEntries, AStoredEntryOfAnotherLengthThanItsDataIsInconsistent) {
+TEST(ApkEntries, StoredEntryThatClaimsAnotherLengthIsInconsistent) {
   const ZipItem item = AndroidManifestItem(false);
   for (const uint32_t length : {0u, 1u, static_cast<uint32_t>(item.data.size()) + 1}) {
     EXPECT_EQ(LogOfAndroidManifest(ClaimingLength(item, length)),
@@ -98,7 +98,7 @@ TEST(ApkEntries, AStoredEntryOfAnotherLengthThanItsDataIsInconsistent) {
   }
 }
 
-TEST(ApkEntries, ADeflatedEntryLongerThanDeflateCanMakeItIsInconsistent) {
+TEST(ApkEntries, DeflatedEntryWithAnImpossibleLengthIsInconsistent) {
   const ZipItem item = AndroidManifestItem(true);
   const auto compressed_length = static_cast<uint32_t>(Deflate(item.data).size());
   for (const uint32_t length : {1032 * compressed_length + 1, 0xfffffffeu}) {
@@ -107,14 +107,14 @@ TEST(ApkEntries, ADeflatedEntryLongerThanDeflateCanMakeItIsInconsistent) {
   }
 }
 
-TEST(ApkEntries, ADeflatedEntryThatIsShorterThanItSaysIsInconsistent) {
+TEST(ApkEntries, DeflatedEntryShorterThanItClaimsIsInconsistent) {
   const ZipItem item = AndroidManifestItem(true);
   const auto length = static_cast<uint32_t>(item.data.size());
   EXPECT_EQ(LogOfAndroidManifest(ClaimingLength(item, length + 1)),
             "Can't extract Android Manifest: Inconsistent information\n");
 }
 
-TEST(ApkEntries, AnEntryWhoseHeadersDisagreeIsInconsistent) {
+TEST(ApkEntries, EntryWhoseHeadersDisagreeIsInconsistent) {
   ZipItem item = AndroidManifestItem(true);
   item.local.length = 5;
   EXPECT_EQ(LogOfAndroidManifest(item),
@@ -130,13 +130,13 @@ TEST(ApkEntries, EntryWithAFalseDataDescriptorIsInconsistent) {
 }
 
 // 0xFF begins a block of the type that deflate reserves (RFC 1951 section 3.2.3).
-TEST(ApkEntries, AnEntryThatDoesNotInflateIsReportedWithTheLibrarysOwnCode) {
+TEST(ApkEntries, EntryThatCannotBeInflatedIsReportedAsZlibError) {
   ZipItem item = AndroidManifestItem(true);
   item.raw = Bytes(Deflate(item.data).size(), 0xFF);
   EXPECT_EQ(LogOfAndroidManifest(item), "Can't extract Android Manifest: Zlib error\n");
 }
 
-TEST(ApkEntries, AnArchiveWithTwoEntriesOfANameIsNotOpened) {
+TEST(ApkEntries, ArchiveWithTwoEntriesOfOneNameIsNotOpened) {
   Package package = MakePackage(WithoutDex());
   package.items.push_back(package.Item(kAndroidManifestName));
   LogCapture log;

@@ -39,7 +39,7 @@ Decoded Decode(const std::string& text, size_t room) {
 }
 
 // RFC 4648, section 10.
-TEST(Base64Decode, PublishedVectors) {
+TEST(Base64Decode, DecodesThePublishedVectors) {
   EXPECT_EQ(ToBytes(""), Base64Decode(""));
   EXPECT_EQ(ToBytes("f"), Base64Decode("Zg=="));
   EXPECT_EQ(ToBytes("fo"), Base64Decode("Zm8="));
@@ -49,7 +49,7 @@ TEST(Base64Decode, PublishedVectors) {
   EXPECT_EQ(ToBytes("foobar"), Base64Decode("Zm9vYmFy"));
 }
 
-TEST(Base64Decode, AgreesWithLibcryptoOnEveryLength) {
+TEST(Base64Decode, AgreesWithLibcryptoOnLengthsBelow600) {
   Bytes bytes;
   for (uint32_t i = 0; i < 600; ++i) {
     std::string text(4 * (bytes.size() / 3 + 1) + 1, '\0');
@@ -60,7 +60,7 @@ TEST(Base64Decode, AgreesWithLibcryptoOnEveryLength) {
   }
 }
 
-TEST(Base64Decode, QuarterPaddedTwiceIsOneByte) { EXPECT_EQ(Bytes({0x41}), Base64Decode("QQ==")); }
+TEST(Base64Decode, GroupPaddedTwiceIsOneByte) { EXPECT_EQ(Bytes({0x41}), Base64Decode("QQ==")); }
 
 TEST(Base64Decode, MissingPaddingIsAccepted) {
   EXPECT_EQ(ToBytes("AB"), Base64Decode("QUI"));
@@ -86,7 +86,7 @@ TEST(Base64Decode, TextAfterTheFirstEqualsSignIsIgnored) {
   EXPECT_EQ(ToBytes(""), Base64Decode("=QUJD"));
 }
 
-TEST(Base64Decode, TextWithASpaceBecomesEmpty) {
+TEST(Base64Decode, TextWithASpaceGivesNoBytes) {
   EXPECT_EQ(Bytes(), Base64Decode("QUJD REVG"));
   EXPECT_EQ(Bytes(), Base64Decode(" QUJD"));
   EXPECT_EQ(Bytes(), Base64Decode("QUJD "));
@@ -94,7 +94,7 @@ TEST(Base64Decode, TextWithASpaceBecomesEmpty) {
 
 // Each byte value is appended to a whole group of four characters. An accepted byte is skipped,
 // ends the text, or is a left-over value. Every other byte is refused.
-TEST(Base64Decode, OnlyBytesWithAMeaningAreAccepted) {
+TEST(Base64Decode, OnlyAlphabetPaddingLineBreaksAndNulAreAccepted) {
   const std::string accepted =
       "ABCDEFGHIJKLMNOPQRSTUVWXYZabcdefghijklmnopqrstuvwxyz0123456789+/=\r\n" + std::string(1, 0);
   for (int byte = 0; byte < 256; ++byte) {
@@ -107,7 +107,7 @@ TEST(Base64Decode, OnlyBytesWithAMeaningAreAccepted) {
 }
 
 // The alphabet in order: values 0, 1, 2, 3 are 000000 000001 000010 000011, and so on.
-TEST(Base64Decode, TheAlphabetCountsFromZeroToSixtyThree) {
+TEST(Base64Decode, AlphabetHasTheValues0To63InOrder) {
   Bytes expected;
   for (int value = 0; value < 64; value += 4) {
     const int group = value << 18 | (value + 1) << 12 | (value + 2) << 6 | (value + 3);
@@ -131,18 +131,18 @@ TEST(Base64Decode, ErrorDropsTheBytesDecodedBefore) {
   EXPECT_EQ(Bytes(), Base64Decode("QUJDREVG!"));
 }
 
-TEST(Base64DecodeToBuffer, LengthIsThatOfTheBytesWritten) {
+TEST(Base64DecodeToBuffer, LengthIsTheNumberOfBytesWritten) {
   EXPECT_EQ((Decoded{0, 6, {'A', 'B', 'C', 'D', 'E', 'F', kUntouched, kUntouched}}),
             Decode("QUJDREVG", 8));
 }
 
-TEST(Base64DecodeToBuffer, RoomThatIsJustEnoughIsEnough) {
+TEST(Base64DecodeToBuffer, BufferOfTheExactSizeIsEnough) {
   EXPECT_EQ((Decoded{0, 3, ToBytes("ABC")}), Decode("QUJD", 3));
   EXPECT_EQ((Decoded{0, 5, ToBytes("ABCDE")}), Decode("QUJDREU=", 5));
   EXPECT_EQ((Decoded{0, 4, ToBytes("ABCD")}), Decode("QUJDRA==", 4));
 }
 
-TEST(Base64DecodeToBuffer, AWholeGroupBeyondTheRoomIsRefused) {
+TEST(Base64DecodeToBuffer, WholeGroupBeyondTheRoomIsRefused) {
   EXPECT_EQ((Decoded{1, 2, {kUntouched, kUntouched}}), Decode("QUJD", 2));
   EXPECT_EQ((Decoded{1, 5, {'A', 'B', 'C', kUntouched, kUntouched}}), Decode("QUJDREVG", 5));
 }
@@ -163,7 +163,7 @@ TEST(Base64DecodeToBuffer, EmptyTextNeedsNoBuffers) {
   EXPECT_EQ(0U, length);
 }
 
-TEST(Base64DecodeToBuffer, AnInvalidByteLeavesTheLengthAsItWas) {
+TEST(Base64DecodeToBuffer, InvalidByteLeavesTheLengthAsItWas) {
   EXPECT_EQ((Decoded{1, 4, {'A', 'B', 'C', kUntouched}}), Decode("QUJD!", 4));
 }
 

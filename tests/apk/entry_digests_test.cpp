@@ -38,19 +38,19 @@ std::string Section(const std::string& name, const std::string& digest) {
   return "Name: " + name + "\r\nSHA-256-Digest: " + digest + "\r\n\r\n";
 }
 
-TEST(EntryDigests, FreshObjectHasNone) {
+TEST(EntryDigests, FreshObjectHasNoDigest) {
   std::string digest_name, digest;
   EXPECT_FALSE(EntryDigests().Find("a", digest_name, digest));
 }
 
-TEST(EntryDigests, EntriesInTheOrderOfTheirNamesAreFound) {
+TEST(EntryDigests, SortedEntriesAreFound) {
   const Recorded recorded(Section("a", "1") + Section("b", "2") + Section("c", "3"));
   EXPECT_EQ("SHA-256-Digest 1", recorded.Of("a"));
   EXPECT_EQ("SHA-256-Digest 2", recorded.Of("b"));
   EXPECT_EQ("SHA-256-Digest 3", recorded.Of("c"));
 }
 
-TEST(EntryDigests, EntriesInAnyOtherOrderAreFound) {
+TEST(EntryDigests, UnsortedEntriesAreFound) {
   const Recorded recorded(Section("b", "2") + Section("a/b", "4") + Section("c", "3") +
                           Section("\xFF", "5") + Section("a", "1"));
   EXPECT_EQ("SHA-256-Digest 1", recorded.Of("a"));
@@ -67,7 +67,7 @@ TEST(EntryDigests, NamesAreComparedWhole) {
   }
 }
 
-TEST(EntryDigests, OfEqualNamesTheLaterSectionCountsInAnyOrder) {
+TEST(EntryDigests, LastSectionWithTheNameCounts) {
   EXPECT_EQ("SHA-256-Digest 2", Recorded(Section("a", "1") + Section("a", "2")).Of("a"));
   const Recorded unordered(Section("b", "0") + Section("a", "1") + Section("b", "3") +
                            Section("a", "2") + Section("a", "4"));
@@ -76,7 +76,7 @@ TEST(EntryDigests, OfEqualNamesTheLaterSectionCountsInAnyOrder) {
 }
 
 // A sort that is not stable may keep a few equal names in order by chance, but not so many.
-TEST(EntryDigests, OfManyEqualNamesTheLastSectionCounts) {
+TEST(EntryDigests, LastOf50SectionsWithTheNameCounts) {
   std::string sections = Section("z", "0");
   for (int i = 1; i <= 100; ++i) sections += Section(i % 2 == 0 ? "a" : "b", std::to_string(i));
   const Recorded recorded(sections);
@@ -122,7 +122,7 @@ TEST(EntryDigests, NamesWithEqualHashesAreDistinguished) {
   }
 }
 
-TEST(EntryDigests, ANameThatOnlySharesAHashHasNoDigest) {
+TEST(EntryDigests, NameThatOnlySharesAHashHasNoDigest) {
   const Recorded recorded(Section("d", "1") + Section("d123456r", "2") +
                           Section(With64Between("cba"), "3") + Section(With64Between("abc"), "4"));
   for (const std::string& name :
@@ -132,11 +132,11 @@ TEST(EntryDigests, ANameThatOnlySharesAHashHasNoDigest) {
   }
 }
 
-TEST(EntryDigests, ALaterSectionWithoutADigestReplacesNothing) {
+TEST(EntryDigests, LaterSectionWithoutADigestReplacesNothing) {
   EXPECT_EQ("SHA-256-Digest 1", Recorded(Section("a", "1") + "Name: a\r\nX: 2\r\n\r\n").Of("a"));
 }
 
-TEST(EntryDigests, OfSeveralDigestsTheLastInTheOrderOfNamesCounts) {
+TEST(EntryDigests, LastDigestInTheOrderOfNamesCounts) {
   const std::string both = "Name: a\r\nSHA1-Digest: 1\r\nSHA-256-Digest: 2\r\n\r\n";
   EXPECT_EQ("SHA1-Digest 1", Recorded(both).Of("a"));
 }
@@ -150,7 +150,7 @@ TEST(EntryDigests, NamesAndDigestsOnSeveralLinesAreJoined) {
   EXPECT_EQ("SHA-256-Digest 456", recorded.Of("res/drawable/b"));
 }
 
-TEST(EntryDigests, SectionWithoutNameDigestOrValueIsNotListed) {
+TEST(EntryDigests, SectionWithoutNameOrDigestOrValueIsNotListed) {
   const Recorded recorded(
       "Name: a\r\n\r\nName: b\r\nSHA1-Digest: \r\n\r\nName: \r\nSHA1-Digest: 1\r\n\r\n");
   for (const char* name : {"a", "b", ""}) EXPECT_EQ("none", recorded.Of(name)) << name;
@@ -166,7 +166,7 @@ TEST(EntryDigests, NamesOfAttributesAreCaseSensitive) {
   EXPECT_EQ("none", recorded.Of("d"));
 }
 
-TEST(EntryDigests, NothingIsListedBeforeListIsCalled) {
+TEST(EntryDigests, EntriesAreFoundOnlyAfterListIsCalled) {
   const std::string text = Section("a", "1");
   EntryDigests digests;
   EXPECT_TRUE(digests.Load({text.begin(), text.end()}));
@@ -195,7 +195,7 @@ TEST(EntryDigests, LoadingAnotherManifestForgetsTheFirst) {
 
 // Loads every pair of these manifests, one after the other. Some have sorted names, some have
 // unsorted names, and the last does not parse.
-TEST(EntryDigests, NothingOfAnEarlierManifestSurvives) {
+TEST(EntryDigests, EarlierManifestDoesNotAffectTheNext) {
   const std::string manifests[] = {
       "",
       Section("a", "1"),
@@ -223,7 +223,7 @@ TEST(EntryDigests, NothingOfAnEarlierManifestSurvives) {
 
 // The third section is still in memory, after the end of the text and in the former contents of the
 // table. It must not be listed.
-TEST(EntryDigests, NoMoreSectionsAreListedThanThereAre) {
+TEST(EntryDigests, SectionAfterTheEndOfTheTextIsNotListed) {
   const std::string two = Section("a", "1") + Section("b", "2");
   const std::string whole = two + Section("c", "3");
   EntryDigests digests;
@@ -236,7 +236,7 @@ TEST(EntryDigests, NoMoreSectionsAreListedThanThereAre) {
   EXPECT_EQ("none", Found(digests, "c"));
 }
 
-TEST(EntryDigests, AFoundDigestReplacesBothTexts) {
+TEST(EntryDigests, FindChangesBothTextsOnlyIfItSucceeds) {
   const std::string text = Section("a", "1");
   EntryDigests digests;
   ASSERT_TRUE(digests.Load({text.begin(), text.end()}));
@@ -250,7 +250,7 @@ TEST(EntryDigests, AFoundDigestReplacesBothTexts) {
   EXPECT_EQ("1", digest);
 }
 
-TEST(EntryDigests, AManifestThatDoesNotParseIsNotLoaded) {
+TEST(EntryDigests, ManifestThatCannotBeParsedIsNotLoaded) {
   LogCapture log;
   const std::string text = Section("a", "1") + "Key:x";
   EXPECT_FALSE(EntryDigests().Load({text.begin(), text.end()}));

@@ -40,7 +40,7 @@ PackageOptions WithDigests(const std::vector<std::string>& digests) {
 
 // ---- The package's verdict.
 
-TEST(IsGoodApk, TheDexThatTheManifestListsIsGood) {
+TEST(IsGoodApk, DexThatTheManifestListsIsGood) {
   LogCapture log;
   OpenPackage open{PackageOptions()};
   EXPECT_TRUE(open.apk.IsGoodApk());
@@ -48,7 +48,7 @@ TEST(IsGoodApk, TheDexThatTheManifestListsIsGood) {
   EXPECT_EQ(log.records(), Records());
 }
 
-TEST(IsGoodApk, APackageWithoutDexIsGood) {
+TEST(IsGoodApk, PackageWithoutDexIsGood) {
   PackageOptions options;
   options.entries.clear();
   LogCapture log;
@@ -57,7 +57,7 @@ TEST(IsGoodApk, APackageWithoutDexIsGood) {
   EXPECT_EQ(log.records(), Records());
 }
 
-TEST(IsGoodApk, ADexThatTheManifestDoesNotListIsReportedOnce) {
+TEST(IsGoodApk, DexThatTheManifestDoesNotListIsReportedOnce) {
   LogCapture log;
   OpenPackage open(WithManifest(""));
   EXPECT_EQ(log.records(), Records());
@@ -70,7 +70,7 @@ TEST(IsGoodApk, ADexThatTheManifestDoesNotListIsReportedOnce) {
   EXPECT_EQ(log.records(), Records());
 }
 
-TEST(IsGoodApk, ATamperedDexIsBadAndStaysBad) {
+TEST(IsGoodApk, TamperedDexIsBadAndStaysBad) {
   Package package = MakePackage();
   package.Tamper("classes.dex");
   LogCapture log;
@@ -96,7 +96,7 @@ void ChangeDex(OpenPackage& open, const Bytes& archive) {
   ASSERT_EQ(pwrite(open.file.fd(), "X", 1, found - archive.begin()), 1);
 }
 
-TEST(IsGoodApk, AfterOneSuccessTheArchiveIsNotReadAgain) {
+TEST(IsGoodApk, ArchiveIsNotReadAgainAfterOneSuccess) {
   const Bytes archive = MakePackage().Build();
   OpenPackage open(archive);
   EXPECT_TRUE(open.apk.IsGoodApk());
@@ -104,7 +104,7 @@ TEST(IsGoodApk, AfterOneSuccessTheArchiveIsNotReadAgain) {
   EXPECT_TRUE(open.apk.IsGoodApk());
 }
 
-TEST(IsGoodApk, TheArchiveIsReadWhenItIsFirstAsked) {
+TEST(IsGoodApk, DexIsReadByTheFirstCallNotByInit) {
   const Bytes archive = MakePackage().Build();
   LogCapture log;
   OpenPackage open(archive);
@@ -112,7 +112,7 @@ TEST(IsGoodApk, TheArchiveIsReadWhenItIsFirstAsked) {
   EXPECT_FALSE(open.apk.IsGoodApk());
 }
 
-TEST(IsGoodApk, APackageThatInitJudgedBadIsNotExamined) {
+TEST(IsGoodApk, PackageThatInitJudgedBadIsNotExamined) {
   Package package = MakePackage();
   package.Remove(kManifestName);
   LogCapture log;
@@ -121,7 +121,7 @@ TEST(IsGoodApk, APackageThatInitJudgedBadIsNotExamined) {
   EXPECT_EQ(log.records(), Records());
 }
 
-TEST(IsGoodApk, ADexThatIsThereButCannotBeFoundIsBad) {
+TEST(IsGoodApk, DexWhoseHeadersDisagreeOnItsNameIsBad) {
   Package package = MakePackage();
   package.Item("classes.dex").local_name = "Classes.dex";  // the two headers disagree
   LogCapture log;
@@ -142,10 +142,10 @@ void ExpectImpossibleLengthToBeBad(Package package) {
   EXPECT_EQ(log.records(), Records({Error(kDexFailed)}));
 }
 
-TEST(IsGoodApk, ADexOfAnImpossibleLengthIsBad) { ExpectImpossibleLengthToBeBad(MakePackage()); }
+TEST(IsGoodApk, DexOfAnImpossibleLengthIsBad) { ExpectImpossibleLengthToBeBad(MakePackage()); }
 
 // An entry that cannot be extracted does not match, even if the manifest lists it as empty.
-TEST(IsGoodApk, ADexOfAnImpossibleLengthThatIsListedAsEmptyIsBad) {
+TEST(IsGoodApk, DexOfAnImpossibleLengthIsBadEvenIfListedAsEmpty) {
   PackageOptions options;
   options.entries = {{"classes.dex", {}}};
   ExpectImpossibleLengthToBeBad(MakePackage(options));
@@ -174,12 +174,12 @@ bool VerifyEntry(OpenPackage& open, const std::string& name) {
   return open.apk.VerifyEntryHash(name, entry);
 }
 
-TEST(VerifyEntryHash, AnEntryListedWithSha256AloneIsVerifiedWithIt) {
+TEST(VerifyEntryHash, EntryListedWithSha256AloneIsVerified) {
   OpenPackage open(WithDigests({"SHA-256-Digest"}));
   EXPECT_TRUE(VerifyEntry(open, "classes.dex"));
 }
 
-TEST(VerifyEntryHash, AnEntryListedWithSha1AloneIsVerifiedWithIt) {
+TEST(VerifyEntryHash, EntryListedWithSha1AloneIsVerified) {
   OpenPackage open(WithDigests({"SHA1-Digest"}));
   EXPECT_TRUE(VerifyEntry(open, "classes.dex"));
 }
@@ -195,17 +195,17 @@ PackageOptions WithDexDigests(const std::string& sha1_of, const std::string& sha
                           .text());
 }
 
-TEST(VerifyEntryHash, AnEntryListedWithBothIsVerifiedWithSha1) {
+TEST(VerifyEntryHash, EntryListedWithBothIsVerifiedWithSha1) {
   OpenPackage open(WithDexDigests("dex\n035", "other"));
   EXPECT_TRUE(VerifyEntry(open, "classes.dex"));
 }
 
-TEST(VerifyEntryHash, AnEntryListedWithBothIsNotVerifiedWithSha256) {
+TEST(VerifyEntryHash, EntryListedWithBothIsNotVerifiedWithSha256) {
   OpenPackage open(WithDexDigests("other", "dex\n035"));
   EXPECT_FALSE(VerifyEntry(open, "classes.dex"));
 }
 
-TEST(VerifyEntryHash, AMismatchIsNotReported) {
+TEST(VerifyEntryHash, MismatchIsNotReported) {
   Package package = MakePackage();
   package.Tamper("classes.dex");
   LogCapture log;
@@ -214,14 +214,14 @@ TEST(VerifyEntryHash, AMismatchIsNotReported) {
   EXPECT_EQ(log.records(), Records());
 }
 
-TEST(VerifyEntryHash, AnEntryListedWithMd5AloneIsUnsupported) {
+TEST(VerifyEntryHash, EntryListedWithMd5AloneIsUnsupported) {
   LogCapture log;
   OpenPackage open(WithDigests({"MD5-Digest"}));
   EXPECT_FALSE(VerifyEntry(open, "classes.dex"));
   EXPECT_EQ(log.records(), Records({Error("verifyData: Unsupported digest type: MD5-Digest\n")}));
 }
 
-TEST(VerifyEntryHash, AnUndecodableDigestNeverMatches) {
+TEST(VerifyEntryHash, DigestThatCannotBeDecodedDoesNotMatch) {
   LogCapture log;
   OpenPackage open(WithManifest(JarText::Manifest()
                                     .EndSection()
@@ -233,7 +233,7 @@ TEST(VerifyEntryHash, AnUndecodableDigestNeverMatches) {
   EXPECT_EQ(log.records(), Records());
 }
 
-TEST(VerifyEntryHash, AnEntryThatCannotBeExtractedIsNotReported) {
+TEST(VerifyEntryHash, EntryThatCannotBeExtractedIsNotReported) {
   Package package = MakePackage();
   ZipItem& dex = package.Item("classes.dex");
   dex = ClaimingLength(dex, 3);
@@ -243,7 +243,7 @@ TEST(VerifyEntryHash, AnEntryThatCannotBeExtractedIsNotReported) {
   EXPECT_EQ(log.records(), Records());
 }
 
-TEST(VerifyEntryHash, AnEntryThatTheManifestDoesNotListIsReported) {
+TEST(VerifyEntryHash, EntryThatTheManifestDoesNotListIsReported) {
   Package package = MakePackage();
   package.items.push_back({"added.so", ToBytes("added")});
   LogCapture log;
@@ -252,14 +252,14 @@ TEST(VerifyEntryHash, AnEntryThatTheManifestDoesNotListIsReported) {
   EXPECT_EQ(log.records(), Records({Error("Can't find file in META-INF/MANIFEST.MF: added.so\n")}));
 }
 
-TEST(VerifyEntryHash, TheSignaturesOwnFilesNeedNoDigest) {
+TEST(VerifyEntryHash, SignatureFileNeedsNoDigest) {
   LogCapture log;
   OpenPackage open{PackageOptions()};
   EXPECT_TRUE(VerifyEntry(open, "META-INF/CERT.SF"));
   EXPECT_EQ(log.records(), Records());
 }
 
-TEST(VerifyEntryHash, AnEmptyEntryIsVerified) {
+TEST(VerifyEntryHash, EmptyEntryIsVerified) {
   PackageOptions options;
   options.entries = {{"empty", {}}, {"deflated", {}, true}};
   OpenPackage open(options);
@@ -271,14 +271,14 @@ TEST(VerifyEntryHash, AnEmptyEntryIsVerified) {
 
 constexpr char kLibrary[] = "lib/arm64-v8a/libfoo.so";
 
-TEST(VerifyFileHash, TheNameSelectsTheDigestAndThePathSuppliesTheBytes) {
+TEST(VerifyFileHash, NameSelectsTheDigestAndPathSelectsTheBytes) {
   OpenPackage open{PackageOptions()};
   DiskFile library(ToBytes("\177ELF foo"));
   EXPECT_TRUE(open.apk.VerifyFileHash(kLibrary, library.path()));
   EXPECT_FALSE(open.apk.VerifyFileHash("classes.dex", library.path()));
 }
 
-TEST(VerifyFileHash, AMismatchIsNotReported) {
+TEST(VerifyFileHash, MismatchIsNotReported) {
   OpenPackage open{PackageOptions()};
   DiskFile library(ToBytes("\177ELF fop"));
   LogCapture log;
@@ -286,7 +286,7 @@ TEST(VerifyFileHash, AMismatchIsNotReported) {
   EXPECT_EQ(log.records(), Records());
 }
 
-TEST(VerifyFileHash, AFileThatCannotBeReadIsReported) {
+TEST(VerifyFileHash, FileThatCannotBeOpenedIsReported) {
   OpenPackage open{PackageOptions()};
   LogCapture log;
   EXPECT_FALSE(open.apk.VerifyFileHash(kLibrary, "/nowhere/libfoo.so"));
@@ -294,7 +294,7 @@ TEST(VerifyFileHash, AFileThatCannotBeReadIsReported) {
 }
 
 // The digest is decoded first. The file is read even if the digest cannot be decoded.
-TEST(VerifyFileHash, AFileThatCannotBeReadIsReportedWithAnyDigest) {
+TEST(VerifyFileHash, FileIsReadEvenIfItsListedDigestIsBad) {
   for (const char* digest : {"not base64!", "====", "AAAA"}) {
     OpenPackage open(WithManifest(JarText::Manifest()
                                       .EndSection()
@@ -313,7 +313,7 @@ TEST(VerifyFileHash, AFileThatCannotBeReadIsReportedWithAnyDigest) {
 }
 
 // The missing bytes count as zeros, even if the buffer contained bytes of another file before.
-TEST(VerifyFileHash, AFileThatShrinksMeanwhileEndsInZeros) {
+TEST(VerifyFileHash, FileThatShrinksDuringTheReadEndsInZeros) {
   PackageOptions options;
   options.entries = {{"first", ToBytes("the first file")},
                      {"second", ToBytes("A second file")},
@@ -330,7 +330,7 @@ TEST(VerifyFileHash, AFileThatShrinksMeanwhileEndsInZeros) {
   before_read = nullptr;
 }
 
-TEST(VerifyFileHash, TellsWhichFileItRead) {
+TEST(VerifyFileHash, SetsTheStateOfTheFileThatItRead) {
   OpenPackage open{PackageOptions()};
   DiskFile good(ToBytes("\177ELF foo")), bad(ToBytes("\177ELF bar"));
   for (const DiskFile* file : {&good, &bad}) {
@@ -342,7 +342,7 @@ TEST(VerifyFileHash, TellsWhichFileItRead) {
   }
 }
 
-TEST(VerifyFileHash, TellsOfNoFileThatItDidNotRead) {
+TEST(VerifyFileHash, LeavesTheStateUnchangedIfNoFileIsRead) {
   OpenPackage open{PackageOptions()};
   struct stat read = {};
   LogCapture log;
@@ -351,7 +351,7 @@ TEST(VerifyFileHash, TellsOfNoFileThatItDidNotRead) {
   EXPECT_EQ(read.st_ino, 0u);
 }
 
-TEST(VerifyFileHash, AFileListedWithMd5AloneIsUnsupported) {
+TEST(VerifyFileHash, FileListedWithMd5AloneIsUnsupported) {
   OpenPackage open(WithDigests({"MD5-Digest"}));
   DiskFile library(ToBytes("\177ELF foo"));
   LogCapture log;
@@ -359,14 +359,14 @@ TEST(VerifyFileHash, AFileListedWithMd5AloneIsUnsupported) {
   EXPECT_EQ(log.records(), Records({Error("verifyData: Unsupported digest type: MD5-Digest\n")}));
 }
 
-TEST(VerifyFileHash, ASignatureFileIsGoodWithoutBeingRead) {
+TEST(VerifyFileHash, SignatureFileIsGoodWithoutBeingRead) {
   OpenPackage open{PackageOptions()};
   LogCapture log;
   EXPECT_TRUE(open.apk.VerifyFileHash("META-INF/CERT.SF", "/nowhere"));
   EXPECT_EQ(log.records(), Records());
 }
 
-TEST(VerifyFileHash, ASignatureFileThatIsListedIsReadAfterAll) {
+TEST(VerifyFileHash, ListedSignatureFileIsRead) {
   OpenPackage open(
       WithManifest(JarText().Section("META-INF/CERT.SF", {"SHA1-Digest"}, ToBytes("x")).text()));
   LogCapture log;
@@ -374,7 +374,7 @@ TEST(VerifyFileHash, ASignatureFileThatIsListedIsReadAfterAll) {
   EXPECT_EQ(log.records(), Records({Error("Can't open file: /nowhere\n")}));
 }
 
-TEST(VerifyFileHash, ASignatureFileInLowerCaseIsAFileLikeOthers) {
+TEST(VerifyFileHash, SignatureFileInLowerCaseNeedsADigest) {
   OpenPackage open{PackageOptions()};
   LogCapture log;
   EXPECT_FALSE(open.apk.VerifyFileHash("META-INF/cert.sf", "/nowhere"));
@@ -382,7 +382,7 @@ TEST(VerifyFileHash, ASignatureFileInLowerCaseIsAFileLikeOthers) {
             Records({Error("Can't find file in META-INF/MANIFEST.MF: META-INF/cert.sf\n")}));
 }
 
-TEST(VerifyFileHash, AFailedCheckLeavesTheRecordedDigestsAlone) {
+TEST(VerifyFileHash, FailedCheckLeavesTheRecordedDigestsUnchanged) {
   LogCapture log;
   OpenPackage open{PackageOptions()};
   EXPECT_FALSE(open.apk.VerifyFileHash(kLibrary, "/nowhere"));
@@ -393,7 +393,7 @@ TEST(VerifyFileHash, AFailedCheckLeavesTheRecordedDigestsAlone) {
 
 // ---- The names that need no digest.
 
-TEST(CanSkipValidation, TheSevenNamesCan) {
+TEST(CanSkipValidation, IsTrueForTheSevenNames) {
   LogCapture log;
   Apk apk(-1);
   for (const char* name :
@@ -403,7 +403,7 @@ TEST(CanSkipValidation, TheSevenNamesCan) {
   }
 }
 
-TEST(CanSkipValidation, NoOtherNameCan) {
+TEST(CanSkipValidation, IsFalseForOtherNames) {
   LogCapture log;
   Apk apk(-1);
   for (const char* name : {"", "META-INF/", "META-INF/cert.rsa", "META-INF/CERT.DSA", "CERT.RSA",

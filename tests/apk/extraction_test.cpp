@@ -27,14 +27,14 @@ extern "C" void* __wrap_mmap(void* address, size_t size, int protection, int fla
 
 namespace {
 
-TEST(Extraction, AnEntryReplacesTheVectorsContents) {
+TEST(Extraction, EntryReplacesTheVectorsContents) {
   OpenEntry zip({"a", ToBytes("abc"), true});
   Bytes out(100, 1);
   EXPECT_EQ(ExtractZipEntry(zip.handle, &zip.entry, out), 0);
   EXPECT_EQ(out, ToBytes("abc"));
 }
 
-TEST(Extraction, AnEmptyEntryIsExtracted) {
+TEST(Extraction, EmptyEntryIsExtracted) {
   for (const bool deflated : {false, true}) {
     OpenEntry zip({"a", {}, deflated});
     Bytes out(100, 1);
@@ -45,7 +45,7 @@ TEST(Extraction, AnEmptyEntryIsExtracted) {
 
 // Deflate encodes at most 258 bytes in two bits, so its limit is 1032 bytes in one byte. Zeros come
 // close to this limit.
-TEST(Extraction, TheBestDeflatedDataIsPlausible) {
+TEST(Extraction, EntryThatDeflatesBestIsExtracted) {
   const Bytes zeros(10 << 20, 0);
   OpenEntry zip({"a", zeros, true});
   EXPECT_GT(zeros.size(), 1020 * Deflate(zeros).size());
@@ -54,14 +54,14 @@ TEST(Extraction, TheBestDeflatedDataIsPlausible) {
   EXPECT_EQ(out, zeros);
 }
 
-TEST(Extraction, AnImplausibleLengthLeavesTheVectorAlone) {
+TEST(Extraction, ImplausibleLengthLeavesTheVectorUnchanged) {
   OpenEntry zip(ClaimingLength({"a", ToBytes("abc"), true}, 0x7fffffff));
   Bytes out(100, 1);
   EXPECT_EQ(ExtractZipEntry(zip.handle, &zip.entry, out), kZipInconsistentInformation);
   EXPECT_EQ(out, Bytes(100, 1));
 }
 
-TEST(Extraction, TheLimitOfPlausibleLengthsIs1032TimesTheData) {
+TEST(Extraction, PlausibleLengthIsAtMost1032TimesTheData) {
   ZipEntry entry = {};
   entry.method = kCompressDeflated;
   entry.compressed_length = 100;
@@ -73,7 +73,7 @@ TEST(Extraction, TheLimitOfPlausibleLengthsIs1032TimesTheData) {
   EXPECT_TRUE(IsPlausibleLength(entry));
 }
 
-TEST(Extraction, AStoredEntryIsAsLongAsItsData) {
+TEST(Extraction, StoredEntryMustBeAsLongAsItsData) {
   ZipEntry entry = {};
   entry.method = kCompressStored;
   entry.compressed_length = 100;
@@ -97,14 +97,14 @@ const ZipItem& LongItem() {
   return item;
 }
 
-TEST(Extraction, ALongEntryThatTellsTheTruthIsExtracted) {
+TEST(Extraction, LongEntryWithItsTrueLengthIsExtracted) {
   OpenEntry zip(LongItem());
   Bytes out;
   EXPECT_EQ(ExtractZipEntry(zip.handle, &zip.entry, out), 0);
   EXPECT_TRUE(out == Bytes(kLongLength, 0));
 }
 
-TEST(Extraction, ALongEntryThatLiesLeavesTheVectorAlone) {
+TEST(Extraction, LongEntryWithAFalseLengthLeavesTheVectorUnchanged) {
   for (const uint32_t length : {kLongLength - 1, kLongLength + 1}) {
     OpenEntry zip(ClaimingLength(LongItem(), length));
     Bytes out(100, 1);
@@ -116,7 +116,7 @@ TEST(Extraction, ALongEntryThatLiesLeavesTheVectorAlone) {
 // The zip library's code for data that does not inflate.
 constexpr int32_t kZlibError = -2;
 
-TEST(Extraction, AnEntryThatDoesNotInflateHasTheLibrarysCode) {
+TEST(Extraction, EntryThatCannotBeInflatedFailsWithZlibError) {
   for (const bool is_long : {false, true}) {
     ZipItem item = is_long ? LongItem() : ZipItem{"a", Bytes(1000, 0), true};
     item.raw = Bytes(is_long ? LongItem().raw->size() : 100, 0xFF);
@@ -126,7 +126,7 @@ TEST(Extraction, AnEntryThatDoesNotInflateHasTheLibrarysCode) {
   }
 }
 
-TEST(Extraction, ALongEntryThatMemoryCannotHoldLeavesTheVectorAlone) {
+TEST(Extraction, LongEntryThatDoesNotFitInMemoryLeavesTheVectorUnchanged) {
   OpenEntry zip(LongItem());
   Bytes out(100, 1);
   memory_is_short = true;
@@ -136,7 +136,7 @@ TEST(Extraction, ALongEntryThatMemoryCannotHoldLeavesTheVectorAlone) {
   EXPECT_EQ(out, Bytes(100, 1));
 }
 
-TEST(Extraction, AnUnknownMethodIsRefused) {
+TEST(Extraction, UnknownMethodIsRefused) {
   ZipItem item{"a", ToBytes("abc")};
   item.method = 12;
   OpenEntry zip(item);

@@ -72,7 +72,7 @@ std::vector<std::string> ShortNames(size_t count) {
 // sorted again only after its number of names has more than doubled. At its end, it is sorted once
 // more. Here all sorts together make about twice the comparisons of that last sort. This test
 // allows twice that number.
-TEST_F(JarManifestCalls, DistinctShortNamesAreSortedInLogarithmicTime) {
+TEST_F(JarManifestCalls, ShuffledNamesNeed12To48ComparisonsEach) {
   std::vector<std::string> names = ShortNames(4096);
   std::shuffle(names.begin(), names.end(), std::mt19937(1));
   const size_t count = ComparisonsOf(names);
@@ -80,14 +80,14 @@ TEST_F(JarManifestCalls, DistinctShortNamesAreSortedInLogarithmicTime) {
   EXPECT_LT(count, 4 * 12u * 4096);
 }
 
-TEST_F(JarManifestCalls, NamesInOrderAreComparedWithTheirNeighboursAlone) {
+TEST_F(JarManifestCalls, NamesInOrderNeedFewerThan4ComparisonsEach) {
   const size_t count = ComparisonsOf(ShortNames(4096));
   EXPECT_GT(count, 4000u);
   EXPECT_LT(count, 4 * 4096u);
 }
 
 // A few repeated names are sorted again only after the text has advanced by their total length.
-TEST_F(JarManifestCalls, NamesThatRepeatAreComparedInLogarithmicTime) {
+TEST_F(JarManifestCalls, RepeatedNamesNeedFewerThan48ComparisonsEach) {
   std::vector<std::string> names;
   for (int round = 0; round < 64; ++round) {
     for (const std::string& name : ShortNames(64)) names.push_back(name);
@@ -96,7 +96,7 @@ TEST_F(JarManifestCalls, NamesThatRepeatAreComparedInLogarithmicTime) {
 }
 
 // The text before the reset does not matter.
-TEST_F(JarManifestCalls, ATableThatWasResetSortsAsOftenAsAFreshOne) {
+TEST_F(JarManifestCalls, TableAfterResetComparesAsOftenAsAFreshTable) {
   std::string text(100000, 'a');
   text[90001] = 'b';  // this name is the last in the text and in byte order
   const auto* const bytes = reinterpret_cast<const uint8_t*>(text.data());

@@ -36,7 +36,7 @@ void WrapString8(android::String8* string, const char16_t* text, size_t length) 
 
 namespace {
 
-class ManifestCalls : public testing::Test {
+class AndroidManifestCalls : public testing::Test {
  protected:
   void Read(const CompiledXml& xml) {
     apk_.Init(-1, nullptr);
@@ -48,7 +48,7 @@ class ManifestCalls : public testing::Test {
   ApkTools::Apk apk_{-1};
 };
 
-TEST_F(ManifestCalls, NothingButThePackageNameIsConverted) {
+TEST_F(AndroidManifestCalls, OnlyThePackageNameIsConverted) {
   CompiledXml xml;
   xml.StartNamespace("android", kAndroidNamespace)
       .Start("manifest", {IntAttribute("versionCode", 1), StringAttribute("package", "p")})
@@ -61,7 +61,7 @@ TEST_F(ManifestCalls, NothingButThePackageNameIsConverted) {
   EXPECT_EQ(conversions, 1);
 }
 
-TEST_F(ManifestCalls, AttributesOfNoSizeAreOne) {
+TEST_F(AndroidManifestCalls, AttributesOfSizeZeroAreReadAsOne) {
   for (const uint16_t count : {1, 2, 65535}) {
     Read(CompiledXml()
              .StartWithSizelessAttributes("meta-data", StringAttribute("other", "access"), count)
@@ -71,7 +71,7 @@ TEST_F(ManifestCalls, AttributesOfNoSizeAreOne) {
   }
 }
 
-TEST_F(ManifestCalls, AttributeOfNoSizeIsReadWhenItIsAskedFor) {
+TEST_F(AndroidManifestCalls, AttributeOfSizeZeroCanSupplyThePackageName) {
   Read(CompiledXml()
            .StartWithSizelessAttributes("manifest", StringAttribute("package", "p"), 65535)
            .End("manifest"));
@@ -79,7 +79,7 @@ TEST_F(ManifestCalls, AttributeOfNoSizeIsReadWhenItIsAskedFor) {
   EXPECT_EQ(attribute_names, 1);
 }
 
-TEST_F(ManifestCalls, NoAttributesAreRead) {
+TEST_F(AndroidManifestCalls, AttributesAreNotReadIfTheirCountIsZero) {
   Read(CompiledXml()
            .StartWithSizelessAttributes("manifest", StringAttribute("package", "p"), 0)
            .End("manifest"));
@@ -88,7 +88,7 @@ TEST_F(ManifestCalls, NoAttributesAreRead) {
 }
 
 // Each text is converted once, even if many elements have it as the package's name.
-TEST_F(ManifestCalls, TextThatConvertsToNoNameIsConvertedOnce) {
+TEST_F(AndroidManifestCalls, TextThatConvertsToAnEmptyNameIsConvertedOnce) {
   CompiledXml xml(CompiledXml::Pool::kUtf16);
   for (int i = 0; i < 5; ++i) {
     xml.Element("manifest", {StringAttribute("package", "\xED\xA0\x80")});

@@ -70,7 +70,7 @@ TEST(ManifestMf, FreshObjectIsInvalidAndEmpty) {
   EXPECT_TRUE(SectionsOf(manifest).empty());
 }
 
-TEST(ManifestMf, LoadStartsFromScratch) {
+TEST(ManifestMf, LoadReplacesTheEarlierResult) {
   ManifestMf manifest;
   EXPECT_TRUE(manifest.load("A: 1\r\n\r\n"));
   EXPECT_TRUE(manifest.load("B: 2\r\n\r\n"));
@@ -85,7 +85,7 @@ TEST(ManifestMf, LoadStartsFromScratch) {
 
 // Loads every pair of these texts, one after the other. Some do not parse. Leftovers of the first
 // text would show in the result of the second.
-TEST(ManifestMf, NothingOfAnEarlierTextSurvives) {
+TEST(ManifestMf, EarlierTextDoesNotAffectTheNext) {
   std::string many = "Longer-Name: longer value\r\n\r\n";
   for (int i = 0; i < 50; ++i) many += "B" + std::to_string(i) + ": 1\r\nC: 2\r\n\r\n";
   const std::string texts[] = {"",
@@ -109,7 +109,7 @@ TEST(ManifestMf, NothingOfAnEarlierTextSurvives) {
 }
 
 // The memory after the text contains bytes that would change the result if they were read.
-TEST(ManifestMf, NothingBehindTheTextIsRead) {
+TEST(ManifestMf, BytesAfterTheTextAreNotRead) {
   LogCapture log;
   const std::string whole = "Name: abcdefghijklm\r\n nopq\r\nKey: 1\r\n\r\nB:\r\n\r\n";
   for (size_t length = 0; length <= whole.size(); ++length) {
@@ -159,11 +159,11 @@ TEST(ManifestMf, LaterOfTwoEqualNamesWins) {
   EXPECT_EQ(Sections({{{"A", "2"}}}), Parse("A: 1\r\nA: 2\r\n\r\n"));
 }
 
-TEST(ManifestMf, NamesThatDifferInCaseAreTwo) {
+TEST(ManifestMf, NamesThatDifferInCaseAreBothKept) {
   EXPECT_EQ(Sections({{{"A", "1"}, {"a", "2"}}}), Parse("A: 1\r\na: 2\r\n\r\n"));
 }
 
-TEST(ManifestMf, EqualNamesInTwoSectionsAreTwo) {
+TEST(ManifestMf, EqualNamesInTwoSectionsAreBothKept) {
   EXPECT_EQ(Sections({{{"A", "1"}}, {{"A", "2"}}}), Parse("A: 1\r\n\r\nA: 2\r\n\r\n"));
 }
 
@@ -188,7 +188,7 @@ TEST(ManifestMf, ContinuationLinesMoveUpToTheirValue) {
   EXPECT_EQ(name.data() + 3, value.data());
 }
 
-TEST(ManifestMf, ContinuationReachesTheValueOfALineWithoutOne) {
+TEST(ManifestMf, ContinuationLineCanBeginTheValue) {
   EXPECT_EQ(Sections({{{"Key", "value"}}}), Parse("Key:\r\n value\r\n\r\n"));
 }
 
@@ -200,7 +200,7 @@ TEST(ManifestMf, SpacesAtTheEndOfAValueStay) {
   EXPECT_EQ(Sections({{{"Key", "v  "}}}), Parse("Key: v  \r\n\r\n"));
 }
 
-TEST(ManifestMf, SpacesAroundANameStay) {
+TEST(ManifestMf, SpaceOrTabAfterANameStays) {
   EXPECT_EQ(Sections({{{"A ", "1"}, {"B\t", "2"}}}), Parse("A : 1\r\nB\t: 2\r\n\r\n"));
 }
 
@@ -208,17 +208,17 @@ TEST(ManifestMf, ColonsInAValueBelongToIt) {
   EXPECT_EQ(Sections({{{"A", "1: 2:x"}}}), Parse("A: 1: 2:x\r\n\r\n"));
 }
 
-TEST(ManifestMf, LinesMayHaveAnyLength) {
+TEST(ManifestMf, LongNameAndLongValueAreReadWhole) {
   const std::string name(5000, 'n');
   const std::string value(70000, 'v');
   EXPECT_EQ(Sections({{{name, value}}}), Parse(name + ": " + value + "\r\n\r\n"));
 }
 
-TEST(ManifestMf, BytesAboveAsciiAreTakenAsTheyAre) {
+TEST(ManifestMf, BytesAboveAsciiAreKept) {
   EXPECT_EQ(Sections({{{"\xFF\x80", "\xC3\xA4\x01"}}}), Parse("\xFF\x80: \xC3\xA4\x01\r\n\r\n"));
 }
 
-TEST(ManifestMf, AnyOtherByteAfterAColonFails) {
+TEST(ManifestMf, LetterOrTabAfterAColonFails) {
   ExpectFault("Key:x", "Parse manifest: Error: P_COLON: unexpected 0x78 after colon: x\n");
   ExpectFault("Key:\tx\r\n\r\n",
               "Parse manifest: Error: P_COLON: unexpected 0x09 after colon: \t\n");
@@ -245,7 +245,7 @@ TEST(ManifestMf, NameThatRunsIntoTheEndOfTheTextFails) {
 
 // The message contains the whole name, or as much of it as fits in a log record: 1024 bytes with a
 // NUL at the end. Without the name, the message takes 66 bytes.
-TEST(ManifestMf, NameThatRunsIntoTheEndOfTheTextIsToldAtAnyLength) {
+TEST(ManifestMf, NameThatRunsIntoTheEndIsReportedInAtMost1023Bytes) {
   const std::string before = "Parse manifest: Error: P_KEY: unexpected end of file after key '";
   std::string name;
   for (int i = 0; name.size() < 5000; ++i) name += std::to_string(i) + " ";
@@ -289,12 +289,12 @@ TEST(ManifestMf, EmptyValueDoesNotReplaceAnEarlierOne) {
   EXPECT_EQ(Sections({{{"A", "1"}}}), Parse("A: 1\r\nA:\r\n\r\n"));
 }
 
-TEST(ManifestMf, SectionThatEndedUpEmptyCounts) {
+TEST(ManifestMf, SectionWhoseOnlyPairIsDroppedCounts) {
   EXPECT_EQ(Sections({{}}), Parse("Key:\r\n\r\n"));
   EXPECT_EQ(Sections({{}, {{"A", "1"}}}), Parse("Key:\r\n\r\nA: 1\r\n\r\n"));
 }
 
-TEST(ManifestMf, FurtherEmptyLinesAndSpacesBetweenSectionsAreSkipped) {
+TEST(ManifestMf, ExtraEmptyLinesAndSpacesBeforeSectionsAreSkipped) {
   EXPECT_EQ(Sections({{{"A", "1"}}, {{"B", "2"}}}),
             Parse("\r\n A: 1\r\n\r\n\r\n  \r\n \n\rB: 2\r\n\r\n"));
 }
@@ -326,7 +326,7 @@ TEST(ManifestMf, OneByteLineAfterAColonAndALoneLineFeedIsLostWithItsLineBreak) {
   EXPECT_EQ(Sections({{{"Name", "x"}}}), Parse("A:\nN\nName: x\n\n"));
 }
 
-TEST(ManifestMf, LineFeedAfterAColonAtTheEndOfTheTextSucceeds) {
+TEST(ManifestMf, LineBreakOrSpaceAfterAFinalColonSucceeds) {
   EXPECT_EQ(Sections(), Parse("A:\n"));
   EXPECT_EQ(Sections(), Parse("A:\r"));
   EXPECT_EQ(Sections(), Parse("A: "));
@@ -341,7 +341,7 @@ TEST(ManifestMf, EveryKindOfLineBreakEndsLinesAndSections) {
 }
 
 // Tests every byte at every position of values of 1 to 24 bytes.
-TEST(ManifestMf, OnlyCrLfAndNulEndALine) {
+TEST(ManifestMf, OnlyCrOrLfOrNulEndsALine) {
   for (size_t length = 1; length <= 24; ++length) {
     for (size_t at = 0; at < length; ++at) {
       for (int byte = 0; byte < 256; ++byte) {
@@ -381,20 +381,20 @@ TEST(ManifestMf, NulInAValueIsALineBreak) {
 }
 
 // NUL CR and NUL LF are one line break, like CR LF; the second of two NULs starts a name.
-TEST(ManifestMf, NulAndTheLineBreakByteBehindItAreOneLineBreak) {
+TEST(ManifestMf, NulAndTheCrOrLfAfterItAreOneLineBreak) {
   EXPECT_EQ(Sections({{{"A", "1"}, {"B", "2"}}}), Parse(Text("A: 1\0\nB: 2\r\n\r\n")));
   EXPECT_EQ(Sections({{{"A", "1"}}, {{"B", "2"}}}), Parse(Text("A: 1\0\r\nB: 2\r\n\r\n")));
   ExpectNoColon(Text("A: 1\0\0B: 2\r\n\r\n"), "");
 }
 
-TEST(ManifestMf, NulAtTheEndOfTheTextEndsAValueOnly) {
+TEST(ManifestMf, NulAtTheEndOfTheTextCanEndAValueButNotAName) {
   EXPECT_EQ(Sections({{{"A", "1"}}}), Parse(Text("A: 1\r\n\r\nB: 2\0")));
   ExpectNoColon(Text("A: 1\r\n\r\n\0"), "", {{{"A", "1"}}});
 }
 
 // For every prefix of the text, the parser ends, and finds only the first sections of the whole
 // text.
-TEST(ManifestMf, EveryPrefixOfAManifestEnds) {
+TEST(ManifestMf, EveryPrefixGivesTheFirstSectionsOfTheWholeText) {
   LogCapture log;
   const std::string text = "A: 1\r\n 2\r\n\r\nB:\nC: 3\n\nD:\r\n v\r\r";
   const Sections whole = Parse(text);

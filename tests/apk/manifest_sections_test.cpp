@@ -47,7 +47,7 @@ class Table {
 
 Pairs PairsOf(const ManifestSection& section) { return Pairs(section.begin(), section.end()); }
 
-TEST(ManifestSections, AreWalkedInTheirOrder) {
+TEST(ManifestSections, AreIteratedInTheirOrder) {
   Table table;
   table.Add("b", "1").End().End().Add("a", "2").Add("c", "3").End();
   std::vector<Pairs> walked;
@@ -57,14 +57,14 @@ TEST(ManifestSections, AreWalkedInTheirOrder) {
   EXPECT_EQ(walked[2], PairsOf(table.sections[2]));
 }
 
-TEST(ManifestSections, OpenSectionIsNotFound) {
+TEST(ManifestSections, OpenSectionIsNotCounted) {
   Table table;
   table.Add("a", "1").End().Add("b", "2");
   EXPECT_EQ(1u, table.sections.size());
   EXPECT_EQ(Pairs({{"a", "1"}}), PairsOf(table.sections[0]));
 }
 
-TEST(ManifestSections, AFreshTableAndOneThatWasResetAreEmpty) {
+TEST(ManifestSections, AreEmptyAtFirstAndAfterReset) {
   ManifestSections fresh;
   EXPECT_EQ(0u, fresh.size());
   EXPECT_FALSE(fresh.begin() != fresh.end());
@@ -108,7 +108,7 @@ TEST(ManifestSection, FindsTheLastNameWithTheSuffix) {
 
 // A sort that is not stable may keep a few equal names in order by chance, but not so many. The
 // sections have different sizes, so that the table grows while a section is open.
-TEST(ManifestSection, OfEqualNamesTheLastInTheTextCounts) {
+TEST(ManifestSection, LastOfEqualNamesCounts) {
   std::mt19937 random(1);
   Table table(8 << 20);
   std::vector<std::map<std::string, std::string>> expected;
@@ -132,7 +132,7 @@ TEST(ManifestSection, OfEqualNamesTheLastInTheTextCounts) {
 // names are unreadable while the short ones are added. The addition of the second long name
 // compares them once. They must not be compared again before the text has advanced, from the start
 // of the second name, by the length of both.
-TEST(ManifestSection, LongNamesAreComparedAgainOnlyWhenAsMuchTextHasFollowed) {
+TEST(ManifestSection, LongNamesAreNotComparedAgainForEachShortName) {
   constexpr uint32_t kLength = 1 << 20;
   constexpr size_t kAll = 3 * kLength;
   void* const memory =

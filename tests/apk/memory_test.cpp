@@ -62,7 +62,7 @@ long GrowthOfOpening(const Bytes& archive) {
 
 constexpr long kLittleMemory = 100 * kMegabyte;  // the limit if a package declares 4 GB
 
-TEST(ApkMemory, GarbageThatDeclaresGigabytesTouchesLittle) {
+TEST(ApkMemory, GarbageThatDeclaresGigabytesTakesLittleMemory) {
   ZipItem item{kAndroidManifestName, {}, true};
   std::mt19937 random(1);
   item.raw = Bytes(4200000);
@@ -72,7 +72,7 @@ TEST(ApkMemory, GarbageThatDeclaresGigabytesTouchesLittle) {
   EXPECT_LT(growth, kLittleMemory);
 }
 
-TEST(ApkMemory, AFewBytesThatDeclareGigabytesTouchLittle) {
+TEST(ApkMemory, ShortEntryThatDeclaresGigabytesTakesLittleMemory) {
   const ZipItem item{kAndroidManifestName, Bytes(100, 0), true};
   const long growth = GrowthOfOpening(BuildZip({ClaimingLength(item, 0xfffffffe)}));
   EXPECT_GE(growth, 0);
@@ -98,7 +98,7 @@ std::string Repeat(const std::string& text, size_t count) {
 
 // The text is one section that repeats one name: 40 MB, compressed to 40 kB. The verification must
 // not make a second copy of the text.
-TEST(ApkMemory, NamesThatRepeatTakeNone) {
+TEST(ApkMemory, RepeatedNamesTakeLittleBesidesTheText) {
   const long growth = GrowthWithSignatureFile(Repeat("A: 1\n", 8000000));
   EXPECT_GE(growth, 39 * kMegabyte);
   EXPECT_LT(growth, 60 * kMegabyte + kKept);
@@ -107,7 +107,7 @@ TEST(ApkMemory, NamesThatRepeatTakeNone) {
 // A million sections of one attribute each. Each section takes 20 bytes in ManifestSections, and 20
 // more bytes while ManifestSections grows. Repeated names after these sections take no memory
 // there, but they make the text itself 20 MB longer.
-TEST(ApkMemory, NamesThatRepeatTakeNoneAfterManySections) {
+TEST(ApkMemory, RepeatedNamesAfterManySectionsTakeLittleBesidesTheText) {
   const std::string sections = Repeat("A: 1\n\n", 1000000);
   const long growth = GrowthWithSignatureFile(sections);
   EXPECT_LT(GrowthWithSignatureFile(sections + Repeat("A: 1\n", 4000000)),
@@ -150,14 +150,14 @@ Bytes DocumentOfOverlappingStrings() {
 
 // The library keeps each converted string. The tool cannot know in advance how much memory a name
 // will take.
-TEST(ApkMemory, OverlappingStringsOfTheAndroidManifestTakeMuchOfThePlatformsMemory) {
+TEST(ApkMemory, OverlappingStringsTakeOver100TimesTheDocumentsSize) {
   const Bytes document = DocumentOfOverlappingStrings();
   const long growth = PeakGrowth([&] { return ApkTools::Apk(-1).ParseAndroidManifest(document); });
   EXPECT_GT(growth * 1024, 100 * static_cast<long>(document.size()));
 }
 
 // Verifies one library at a time. The sizes rise and fall from one library to the next.
-TEST(ApkMemory, LibrariesTakeTheLargestOnesSize) {
+TEST(ApkMemory, LibrariesTakeOnlyTheMemoryOfTheLargest) {
   PackageOptions options = WithoutDex();
   TempDir directory;
   for (const size_t megabytes : {40, 60, 20, 50}) {

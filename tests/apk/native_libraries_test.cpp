@@ -7,7 +7,7 @@ namespace {
 
 using ApkTools::InstalledLibraryPath;
 
-TEST(InstalledLibraryPath, EachAbiDirectoryHasItsPlaceBesideThePackage) {
+TEST(InstalledLibraryPath, IsInLibArmOrLibArm64BesideThePackage) {
   const auto path = [](const char* entry) {
     return InstalledLibraryPath("/data/app/pkg-1/base.apk", entry);
   };
@@ -17,7 +17,7 @@ TEST(InstalledLibraryPath, EachAbiDirectoryHasItsPlaceBesideThePackage) {
   EXPECT_EQ(path("lib/armeabi/libfoo.so"), "/data/app/pkg-1/lib/arm/libfoo.so");
 }
 
-TEST(InstalledLibraryPath, OtherAbisHaveNone) {
+TEST(InstalledLibraryPath, IsEmptyForOtherAbis) {
   for (const char* entry : {"lib/x86/libfoo.so", "lib/x86_64/libfoo.so", "lib/arm64/libfoo.so",
                             "lib/arm64-v8/libfoo.so", "Lib/arm64-v8a/libfoo.so", ""}) {
     EXPECT_EQ(InstalledLibraryPath("/data/app/pkg-1/base.apk", entry), "") << entry;

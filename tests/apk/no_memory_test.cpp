@@ -8,7 +8,7 @@
 namespace {
 
 // In the tool's code, only the large integers are allocated with malloc.
-TEST(VerifyCertificate, AKeyThatFindsNoMemoryIsReportedWithItsCode) {
+TEST(VerifyCertificate, FailedAllocationForTheKeyIsReportedWithCode9) {
   const Bytes archive = MakePackage().Build();
   LogCapture log;
   const FailingMalloc failing(1);
@@ -22,7 +22,7 @@ TEST(VerifyCertificate, AKeyThatFindsNoMemoryIsReportedWithItsCode) {
 // The allocations after the first belong to the verification of the certificate, and then to the
 // verification of the data. If one of these allocations fails, the verification that it belongs to
 // fails.
-TEST(VerifyCertificate, AVerificationThatFindsNoMemoryIsReportedWithItsCode) {
+TEST(VerifyCertificate, FailedAllocationInTheVerificationIsReported) {
   const Bytes archive = MakePackage().Build();
   int certificates = 0, signatures = 0;
   for (int call = 2;; ++call) {

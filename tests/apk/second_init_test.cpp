@@ -90,7 +90,7 @@ std::vector<PackageOptions> GoodPackages() {
   return all;
 }
 
-TEST(SecondInit, HasTheSecondPackagesFactsAlone) {
+TEST(SecondInit, HasOnlyTheFactsOfTheSecondPackage) {
   std::vector<std::unique_ptr<MemoryFile>> files;
   for (const PackageOptions& options : GoodPackages()) {
     const std::string name = "package" + std::to_string(files.size());
@@ -109,7 +109,7 @@ TEST(SecondInit, HasTheSecondPackagesFactsAlone) {
   }
 }
 
-TEST(SecondInit, ThatFailsHasNoFlagOfTheFirst) {
+TEST(SecondInit, HasNoFlagOfTheFirstPackageIfItFails) {
   Package unsigned_package = MakePackage(WithEntries({"a"}));
   unsigned_package.Remove("META-INF/CERT.SF");
   Package tampered = MakePackage(WithEntries({"b"}));

@@ -24,11 +24,11 @@ PackageOptions WithSignatureFile(const std::string& text) {
 
 // ---- Finding the signature file and its block.
 
-TEST(InitCertSf, ThePackageThatIsSignedAsUsualIsGood) {
+TEST(InitCertSf, PackageThatIsSignedAsUsualIsGood) {
   EXPECT_EQ(LogOf(PackageOptions()), Records());
 }
 
-TEST(InitCertSf, ABlockGoesByTheBaseNameOfItsSignatureFile) {
+TEST(InitCertSf, BlockIsFoundByTheBaseNameOfItsSignatureFile) {
   PackageOptions options;
   options.base_name = "META-INF/ANDROIDD";
   EXPECT_EQ(LogOf(options), Records());
@@ -39,13 +39,13 @@ TEST(InitCertSf, ABlockGoesByTheBaseNameOfItsSignatureFile) {
             Records({Error("Can't extract RSA certificate: META-INF/ANDROIDD.RSA\n")}));
 }
 
-TEST(InitCertSf, TheLastDotEndsTheBaseName) {
+TEST(InitCertSf, LastDotEndsTheBaseName) {
   PackageOptions options;
   options.base_name = "META-INF/A.B";
   EXPECT_EQ(LogOf(options), Records());
 }
 
-TEST(InitCertSf, WithoutASignatureFileItFailsSilently) {
+TEST(InitCertSf, FailsSilentlyWithoutASignatureFile) {
   Package package = MakePackage();
   package.Remove("META-INF/CERT.SF");
   LogCapture log;
@@ -54,7 +54,7 @@ TEST(InitCertSf, WithoutASignatureFileItFailsSilently) {
   EXPECT_EQ(log.records(), Records());
 }
 
-TEST(InitCertSf, ASignatureFileInLowerCaseIsIgnored) {
+TEST(InitCertSf, SignatureFileInLowerCaseIsIgnored) {
   Package package = MakePackage();
   package.Item("META-INF/CERT.SF").name = "META-INF/cert.sf";
   package.Item("META-INF/CERT.RSA").name = "META-INF/cert.RSA";
@@ -64,7 +64,7 @@ TEST(InitCertSf, ASignatureFileInLowerCaseIsIgnored) {
   EXPECT_EQ(log.records(), Records());
 }
 
-TEST(InitCertSf, ASignatureFileElsewhereIsIgnored) {
+TEST(InitCertSf, SignatureFileOutsideMetaInfIsIgnored) {
   PackageOptions options;
   options.base_name = "OTHER/CERT";
   LogCapture log;
@@ -73,7 +73,7 @@ TEST(InitCertSf, ASignatureFileElsewhereIsIgnored) {
   EXPECT_EQ(log.records(), Records());
 }
 
-TEST(InitCertSf, ASignatureFileThatCannotBeExtractedFailsSilently) {
+TEST(InitCertSf, SignatureFileThatCannotBeExtractedFailsSilently) {
   for (const uint32_t length : {1u, 0xfffffffeu}) {
     Package package = MakePackage();
     ZipItem& file = package.Item("META-INF/CERT.SF");
@@ -86,18 +86,18 @@ TEST(InitCertSf, ASignatureFileThatCannotBeExtractedFailsSilently) {
   }
 }
 
-TEST(InitCertSf, ASignatureFileThatDoesNotParseIsReportedByTheParserAlone) {
+TEST(InitCertSf, SignatureFileThatCannotBeParsedIsReportedOnlyByTheParser) {
   EXPECT_EQ(LogOf(WithSignatureFile("Key:x")),
             Records({Error("Parse manifest: Error: P_COLON: unexpected 0x78 after colon: x\n")}));
 }
 
-TEST(InitCertSf, ABlockThatIsMissingIsReported) {
+TEST(InitCertSf, MissingBlockIsReported) {
   Package package = MakePackage();
   package.Remove("META-INF/CERT.RSA");
   EXPECT_EQ(LogOf(package), Records({Error("Can't extract RSA certificate: META-INF/CERT.RSA\n")}));
 }
 
-TEST(InitCertSf, ABlockThatCannotBeExtractedIsReported) {
+TEST(InitCertSf, BlockThatCannotBeExtractedIsReported) {
   Package package = MakePackage();
   ZipItem& block = package.Item("META-INF/CERT.RSA");
   block.deflated = true;
@@ -105,7 +105,7 @@ TEST(InitCertSf, ABlockThatCannotBeExtractedIsReported) {
   EXPECT_EQ(LogOf(package), Records({Error("Can't extract RSA certificate: META-INF/CERT.RSA\n")}));
 }
 
-TEST(InitCertSf, BlocksOfOtherKindsAreNotLookedFor) {
+TEST(InitCertSf, DsaAndEcBlocksAreIgnored) {
   for (const char* extension : {".DSA", ".EC"}) {
     PackageOptions options;
     options.block_extension = extension;
@@ -116,7 +116,7 @@ TEST(InitCertSf, BlocksOfOtherKindsAreNotLookedFor) {
 
 // The zip library has its own order of entries, so the test asks the library for the first
 // signature file.
-TEST(InitCertSf, OfTwoSignersTheFirstInTheZipLibrarysOrderDecides) {
+TEST(InitCertSf, FirstOfTwoSignersInTheZipLibrarysOrderDecides) {
   PackageOptions options;
   options.base_name = "META-INF/OTHER";
   Package package = MakePackage(options);
@@ -133,7 +133,7 @@ TEST(InitCertSf, OfTwoSignersTheFirstInTheZipLibrarysOrderDecides) {
   EXPECT_EQ(open.apk.IsGoodApk(), name == "META-INF/OTHER.SF");
 }
 
-TEST(InitCertSf, ASignatureFileStaysLoadedWhenALaterStepFails) {
+TEST(InitCertSf, SignatureFileStaysLoadedIfALaterStepFails) {
   Package package = MakePackage();
   const Bytes manifest = package.Item(kManifestName).data;
   package.Remove("META-INF/CERT.RSA");
@@ -145,7 +145,7 @@ TEST(InitCertSf, ASignatureFileStaysLoadedWhenALaterStepFails) {
   EXPECT_EQ(log.records(), Records());
 }
 
-TEST(InitCertSf, ATamperedSignatureFileIsNotVerified) {
+TEST(InitCertSf, TamperedSignatureFileIsReported) {
   Package package = MakePackage();
   Bytes& text = package.Item("META-INF/CERT.SF").data;
   *std::find(text.begin(), text.end(), '1') = '2';  // of "Signature-Version: 1.0"
@@ -172,22 +172,22 @@ Records LogOfDigests(const std::vector<std::string>& right, const std::vector<st
   return LogOf(WithSignatureFile(ManifestDigests(right, wrong).EndSection().text()));
 }
 
-TEST(ValidateManifest, Sha256AloneIsUsed) {
+TEST(ValidateManifest, Sha256IsUsedIfItIsTheOnlyDigest) {
   EXPECT_EQ(LogOfDigests({"SHA-256-Digest"}, {}), Records());
   EXPECT_EQ(LogOfDigests({}, {"SHA-256-Digest"}), RefusedTwice());
 }
 
-TEST(ValidateManifest, Sha1AloneIsUsed) {
+TEST(ValidateManifest, Sha1IsUsedIfItIsTheOnlyDigest) {
   EXPECT_EQ(LogOfDigests({"SHA1-Digest"}, {}), Records());
   EXPECT_EQ(LogOfDigests({}, {"SHA1-Digest"}), RefusedTwice());
 }
 
-TEST(ValidateManifest, OfBothSha1AloneIsUsed) {
+TEST(ValidateManifest, Sha1IsUsedIfSha256IsAlsoPresent) {
   EXPECT_EQ(LogOfDigests({"SHA1-Digest"}, {"SHA-256-Digest"}), Records());
   EXPECT_EQ(LogOfDigests({"SHA-256-Digest"}, {"SHA1-Digest"}), RefusedTwice());
 }
 
-TEST(ValidateManifest, Md5LosesToBothOthers) {
+TEST(ValidateManifest, Md5IsIgnoredIfSha1OrSha256IsPresent) {
   EXPECT_EQ(LogOfDigests({"SHA1-Digest"}, {"MD5-Digest"}), Records());
   EXPECT_EQ(LogOfDigests({"SHA-256-Digest"}, {"MD5-Digest"}), Records());
 }
@@ -198,11 +198,11 @@ TEST(ValidateManifest, Md5AloneIsUnsupported) {
                      Error("Can't validate manifest.\n"), Error("Can't validate manifest.\n")}));
 }
 
-TEST(ValidateManifest, ASignatureFileWithoutTheDigestIsRefused) {
+TEST(ValidateManifest, SignatureFileWithoutTheDigestIsRefused) {
   EXPECT_EQ(LogOf(WithSignatureFile("Signature-Version: 1.0\r\n\r\n")), RefusedTwice());
 }
 
-TEST(ValidateManifest, ASignatureFileWhoseSectionDoesNotEndHasNoDigest) {
+TEST(ValidateManifest, SignatureFileWhoseSectionDoesNotEndHasNoDigest) {
   EXPECT_EQ(LogOf(WithSignatureFile(ManifestDigests({"SHA1-Digest"}, {}).text())), RefusedTwice());
 }
 
@@ -214,7 +214,7 @@ TEST(ValidateManifest, SectionsForSingleEntriesAreNotLookedAt) {
   EXPECT_EQ(LogOf(WithSignatureFile(right + wrong)), Records());
 }
 
-TEST(ValidateManifest, TheMainAttributesDigestIsIgnored) {
+TEST(ValidateManifest, DigestOfTheMainAttributesIsIgnored) {
   const Bytes manifest = MakePackage().Item(kManifestName).data;
   EXPECT_EQ(LogOf(WithSignatureFile(
                 JarText()
@@ -224,20 +224,20 @@ TEST(ValidateManifest, TheMainAttributesDigestIsIgnored) {
             RefusedTwice());
 }
 
-TEST(ValidateManifest, TheFirstSectionMayHaveNoDigest) {
+TEST(ValidateManifest, FirstSectionMayHaveNoDigest) {
   EXPECT_EQ(LogOf(WithSignatureFile("Signature-Version: 1.0\r\n\r\n" +
                                     ManifestDigests({"SHA-256-Digest"}, {}).EndSection().text())),
             Records());
 }
 
-TEST(ValidateManifest, TheFirstSectionWithADigestDecides) {
+TEST(ValidateManifest, FirstSectionWithADigestDecides) {
   const std::string wrong = ManifestDigests({}, {"SHA-256-Digest"}).EndSection().text();
   const std::string right = ManifestDigests({"SHA-256-Digest"}, {}).EndSection().text();
   EXPECT_EQ(LogOf(WithSignatureFile(wrong + right)), RefusedTwice());
   EXPECT_EQ(LogOf(WithSignatureFile(right + wrong)), Records());
 }
 
-TEST(ValidateManifest, ADigestThatDoesNotDecodeIsRefused) {
+TEST(ValidateManifest, DigestThatCannotBeDecodedIsRefused) {
   const Bytes manifest = MakePackage().Item(kManifestName).data;
   const std::string digest = DigestText("SHA-256-Digest", manifest);
   const auto file = [&](const std::string& value) {
@@ -249,19 +249,19 @@ TEST(ValidateManifest, ADigestThatDoesNotDecodeIsRefused) {
   EXPECT_EQ(LogOf(file("====")), RefusedTwice());
 }
 
-TEST(ValidateManifest, ANameThatIsTheSuffixAloneIsAMatchWithoutAnAlgorithm) {
+TEST(ValidateManifest, NameThatIsOnlyTheSuffixIsUnsupported) {
   EXPECT_EQ(LogOf(WithSignatureFile("-Digest-Manifest: AAAA\r\n\r\n")),
             Records({Error("verifyData: Unsupported digest type: -Digest\n"),
                      Error("Can't validate manifest.\n"), Error("Can't validate manifest.\n")}));
 }
 
 // An empty expected digest is refused before its algorithm is checked.
-TEST(ValidateManifest, AnEmptyMd5DigestIsRefusedWithoutAMessageAboutMd5) {
+TEST(ValidateManifest, EmptyMd5DigestIsRefusedWithoutAMessageAboutMd5) {
   EXPECT_EQ(LogOf(WithSignatureFile("MD5-Digest-Manifest: ====\r\n\r\n")),
             Records({Error("Can't validate manifest.\n"), Error("Can't validate manifest.\n")}));
 }
 
-TEST(ValidateManifest, WithoutAValidSignatureFileItIsRefused) {
+TEST(ValidateManifest, MissingSignatureFileIsReported) {
   LogCapture log;
   Apk apk(-1);
   log.Clear();
@@ -284,7 +284,7 @@ class VerifyData : public testing::Test {
   const Bytes abc_ = ToBytes("abc");
 };
 
-TEST_F(VerifyData, TheNameSelectsTheDigest) {
+TEST_F(VerifyData, NameSelectsTheDigest) {
   EXPECT_TRUE(apk_.VerifyData("SHA1-Digest", sha1_, abc_));
   EXPECT_TRUE(apk_.VerifyData("SHA-256-Digest", sha256_, abc_));
   EXPECT_FALSE(apk_.VerifyData("SHA1-Digest", sha256_, abc_));
@@ -298,7 +298,7 @@ TEST_F(VerifyData, OtherDataIsAMismatch) {
   EXPECT_EQ(log_.records(), Records());
 }
 
-TEST_F(VerifyData, AnExpectedDigestOneByteShortOrLongIsAMismatch) {
+TEST_F(VerifyData, ExpectedDigestOfAnotherLengthIsAMismatch) {
   Bytes expected = sha256_;
   expected.pop_back();
   EXPECT_FALSE(apk_.VerifyData("SHA-256-Digest", expected, abc_));

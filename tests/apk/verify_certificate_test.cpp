@@ -20,7 +20,7 @@ PackageOptions WithBlock(const SignatureBlock& block) {
   return options;
 }
 
-TEST(VerifyCertificate, EveryDigestASignerMayUseVerifies) {
+TEST(VerifyCertificate, BlocksWithMd5Sha1OrSha256AreVerified) {
   for (const Digest digest : {Digest::kMd5, Digest::kSha1, Digest::kSha256}) {
     SignatureBlock block;
     block.digest = digest;
@@ -38,12 +38,12 @@ TEST(VerifyCertificate, KeysFrom1024To4096BitsVerifyAndBecomeTheManufacturerKey)
   }
 }
 
-TEST(VerifyCertificate, A2048BitKeyIsKeptAs256Bytes) {
+TEST(VerifyCertificate, KeyOf2048BitsIsKeptAs256Bytes) {
   OpenPackage open{PackageOptions()};
   EXPECT_EQ(open.apk.GetManufacturerKey().size(), 256u);
 }
 
-TEST(VerifyCertificate, ExponentsOfOneByteVerify) {
+TEST(VerifyCertificate, KeysWithAnExponentOfOneByteVerify) {
   for (const char* key : {"rsa-2048-e3", "rsa-2048-e17"}) {
     SignatureBlock block;
     block.key = key;
@@ -59,7 +59,7 @@ TEST(VerifyCertificate, BytesThatAreNotASignatureBlockAreAnUnknownType) {
   EXPECT_NE(testing::internal::GetCapturedStdout(), "");
 }
 
-TEST(VerifyCertificate, AnEmptyBlockIsAnUnknownType) {
+TEST(VerifyCertificate, EmptyBlockIsAnUnknownType) {
   Package package = MakePackage();
   package.Item("META-INF/CERT.RSA").data = {};
   testing::internal::CaptureStdout();
@@ -67,7 +67,7 @@ TEST(VerifyCertificate, AnEmptyBlockIsAnUnknownType) {
   testing::internal::GetCapturedStdout();
 }
 
-TEST(VerifyCertificate, AnEllipticCurveKeyIsAnUnknownType) {
+TEST(VerifyCertificate, EllipticCurveKeyIsAnUnknownType) {
   SignatureBlock block;
   block.key = "ec-p256";
   testing::internal::CaptureStdout();
@@ -76,14 +76,14 @@ TEST(VerifyCertificate, AnEllipticCurveKeyIsAnUnknownType) {
   testing::internal::GetCapturedStdout();
 }
 
-TEST(VerifyCertificate, ACertificateOfAnotherIssuerFailsEvenWithAGoodSignature) {
+TEST(VerifyCertificate, CertificateOfAnotherIssuerFailsEvenWithAGoodSignature) {
   SignatureBlock block;
   block.issuer_key = "rsa-2048-other";
   EXPECT_EQ(LogOf(WithBlock(block)),
             Records({Error("RSA could not verify certificate: 7\n"), Error(kNotVerified)}));
 }
 
-TEST(VerifyCertificate, ASignatureOverOtherBytesFails) {
+TEST(VerifyCertificate, SignatureOverOtherBytesFails) {
   SignatureBlock block;
   block.wrong_digest = true;
   EXPECT_EQ(LogOf(WithBlock(block)),
@@ -94,7 +94,7 @@ TEST(VerifyCertificate, ASignatureOverOtherBytesFails) {
 // The signature is found by its position (crypto/pkcs7.cpp), and the attributes move every later
 // element by one place. The bytes that are read as the signature therefore start with the contents
 // of the digestEncryptionAlgorithm. They have no valid padding, even if the real signature is good.
-TEST(VerifyCertificate, AuthenticatedAttributesFail) {
+TEST(VerifyCertificate, BlockWithAuthenticatedAttributesFails) {
   SignatureBlock block;
   block.authenticated_attributes = true;
   EXPECT_EQ(LogOf(WithBlock(block)),
@@ -113,12 +113,12 @@ SignatureBlock WithPublicKey(const Bytes& modulus, const Bytes& exponent, size_t
   return block;
 }
 
-TEST(VerifyCertificate, AKeyOf2048BytesAlreadyFailsAtTheCertificate) {
+TEST(VerifyCertificate, KeyOf2048BytesFailsAtTheCertificate) {
   EXPECT_EQ(LogOf(WithBlock(WithPublicKey(Bytes(2048, 0x55), {1, 0, 1}, 2048))),
             Records({Error("RSA could not verify certificate: 5\n"), Error(kNotVerified)}));
 }
 
-TEST(VerifyCertificate, AnEmptyKeyFailsAtTheCertificate) {
+TEST(VerifyCertificate, KeyOfOneByteFailsAtTheCertificate) {
   // The exponent is empty, so its element is only a header of two bytes. The length of the modulus
   // INTEGER is the limit for this element. The INTEGER therefore has two bytes, 0 and 1. The
   // modulus is read without the leading zero, so it has one byte.
@@ -126,7 +126,7 @@ TEST(VerifyCertificate, AnEmptyKeyFailsAtTheCertificate) {
             Records({Error("RSA could not verify certificate: 5\n"), Error(kNotVerified)}));
 }
 
-TEST(VerifyCertificate, AnExponentThatRunsIntoTheModulusLengthStaysInTheBlock) {
+TEST(VerifyCertificate, ExponentThatSetsAModulusLengthBeyondTheBlockFails) {
   for (const Bytes& length : {FromHex("ffffff7f"), FromHex("ffffffff"), FromHex("00100000")}) {
     const Bytes exponent = Concat({FromHex("01000100"), length});
     EXPECT_EQ(LogOf(WithBlock(WithPublicKey(Bytes(256, 0x55), exponent, 256))),
@@ -134,7 +134,7 @@ TEST(VerifyCertificate, AnExponentThatRunsIntoTheModulusLengthStaysInTheBlock) {
   }
 }
 
-TEST(VerifyCertificate, AModulusThatEndsWithTheBlockIsRead) {
+TEST(VerifyCertificate, ModulusThatEndsWithTheBlockIsRead) {
   // The fifth to the eighth byte of the exponent overwrite the length of the modulus
   // (crypto/pkcs7.h). In the first check, the modulus ends with the block's last byte. In the
   // second check, it ends one byte later.
@@ -156,14 +156,14 @@ TEST(VerifyCertificate, AModulusThatEndsWithTheBlockIsRead) {
             Records({Error("RSA could not set key: 5\n"), Error(kNotVerified)}));
 }
 
-TEST(VerifyCertificate, ACertificateSignatureThatTheBlockEndsBeforeFails) {
+TEST(VerifyCertificate, CertificateSignatureThatEndsBeyondTheBlockFails) {
   SignatureBlock block = WithPublicKey(Bytes(512, 0x55), {1, 0, 1}, 1);
   block.encrypted_digest = der::OctetString({1});
   EXPECT_EQ(LogOf(WithBlock(block)),
             Records({Error("RSA could not verify certificate: 5\n"), Error(kNotVerified)}));
 }
 
-TEST(VerifyCertificate, ASignatureThatTheBlockEndsBeforeFails) {
+TEST(VerifyCertificate, SignatureThatEndsBeyondTheBlockFails) {
   SignatureBlock block;
   block.encrypted_digest = der::OctetString({1});
   EXPECT_EQ(LogOf(WithBlock(block)),
@@ -180,7 +180,7 @@ PackageOptions WithEncodedSignature(Encode encode) {
   return options;
 }
 
-TEST(VerifyCertificate, ALongerSignatureStringIsReadAsFarAsTheKeyIsLong) {
+TEST(VerifyCertificate, LongerSignatureStringIsReadUpToTheKeysLength) {
   EXPECT_EQ(LogOf(WithEncodedSignature([](Bytes signature) {
               signature.push_back(0xaa);
               return der::OctetString(signature);
@@ -188,7 +188,7 @@ TEST(VerifyCertificate, ALongerSignatureStringIsReadAsFarAsTheKeyIsLong) {
             Records());
 }
 
-TEST(VerifyCertificate, AShorterSignatureStringIsReadBeyondItsEnd) {
+TEST(VerifyCertificate, ShorterSignatureStringIsReadBeyondItsEnd) {
   EXPECT_EQ(LogOf(WithEncodedSignature([](const Bytes& signature) {
               const Bytes shorter(signature.begin(), signature.end() - 1);
               return Concat({der::OctetString(shorter), {signature.back()}});
@@ -196,7 +196,7 @@ TEST(VerifyCertificate, AShorterSignatureStringIsReadBeyondItsEnd) {
             Records());
 }
 
-TEST(VerifyCertificate, AShorterSignatureStringAtTheBlocksEndFails) {
+TEST(VerifyCertificate, ShorterSignatureStringAtTheBlocksEndFails) {
   EXPECT_EQ(LogOf(WithEncodedSignature([](const Bytes& signature) {
               return der::OctetString(Bytes(signature.begin(), signature.end() - 1));
             })),
@@ -221,19 +221,19 @@ Verification Verify(SignatureBlock block, const std::string& covered, const std:
   return result;
 }
 
-TEST(VerifyCertificate, TheKeyIsReplacedOnSuccess) {
+TEST(VerifyCertificate, KeyIsReplacedOnSuccess) {
   const Verification result = Verify({}, "signature file", "signature file");
   EXPECT_TRUE(result.verified);
   EXPECT_EQ(result.key, ModulusOf("rsa-2048"));
 }
 
-TEST(VerifyCertificate, TheKeyIsUntouchedOnFailure) {
+TEST(VerifyCertificate, KeyIsUnchangedOnFailure) {
   const Verification result = Verify({}, "signature file", "other file");
   EXPECT_FALSE(result.verified);
   EXPECT_EQ(result.key, ToBytes("before"));
 }
 
-TEST(VerifyCertificate, ABlockCutShortAnywhereFailsWithoutHarm) {
+TEST(VerifyCertificate, BlockCutShortAnywhereFails) {
   const Bytes whole = SignatureBlock().Build(ToBytes("signature file"));
   Bytes sha1 = DigestOf(Digest::kSha1, ToBytes("signature file"));
   Bytes sha256 = DigestOf(Digest::kSha256, ToBytes("signature file"));

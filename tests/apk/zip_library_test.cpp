@@ -26,31 +26,31 @@ OlderName Older(const std::string& text) {
   return name;
 }
 
-TEST(ZipLibraryOlder, ANameIsGivenWithItsLength) {
+TEST(OlderZipLibrary, NameIsGivenWithItsLength) {
   const std::string text("a\0b", 3);
   const OlderName name = Older(text);
   EXPECT_EQ(reinterpret_cast<const char*>(name.name), text.data());
   EXPECT_EQ(name.name_length, 3);
 }
 
-TEST(ZipLibraryOlder, TheLongestNameIsGivenWhole) {
+TEST(OlderZipLibrary, LongestNameIsGivenWhole) {
   const std::string text(0xffff, 'n');
   EXPECT_EQ(Older(text).name_length, 0xffff);
 }
 
-TEST(ZipLibraryOlder, AsManyBytesAreTakenAsTheNameIsLong) {
+TEST(OlderZipLibrary, NameWithANulIsReadWhole) {
   const std::string text("a\0b", 3);
   EXPECT_EQ(ZipNameText(Older(text)), text);
 }
 
-TEST(ZipLibraryOlder, AnEmptyFilterIsANullPointer) {
+TEST(OlderZipLibrary, EmptyFilterIsANullPointer) {
   const std::string text = "lib/";
   const OlderName name = Older(text), none = Older("");
   EXPECT_EQ(ZipFilter(name), &name);
   EXPECT_EQ(ZipFilter(none), nullptr);
 }
 
-TEST(ZipLibraryLater, ANameAndAFilterAreTheText) {
+TEST(LaterZipLibrary, NameAndFilterEqualTheText) {
   const std::string text("a\0b", 3);
   std::string_view name;
   SetZipName(name, text);
@@ -60,20 +60,20 @@ TEST(ZipLibraryLater, ANameAndAFilterAreTheText) {
   EXPECT_EQ(ZipFilter(std::string_view()), "");
 }
 
-TEST(ZipLibrary, ANameMayHoldAnyCharacters) {
+TEST(ZipLibrary, NameWithUnusualCharactersIsFound) {
   OpenEntry zip({"lib/\u00fc\x01 \n", ToBytes("x")});
   ZipEntry entry;
   EXPECT_EQ(FindZipEntry(zip.handle, "lib/\u00fc\x01 \n", &entry), 0);
   EXPECT_EQ(FindZipEntry(zip.handle, "lib/", &entry), kZipEntryNotFound);
 }
 
-TEST(ZipLibrary, ANameLongerThanAnyIsInvalid) {
+TEST(ZipLibrary, NameOf65536BytesIsInvalid) {
   OpenEntry zip({"a", ToBytes("x")});
   ZipEntry entry;
   EXPECT_EQ(FindZipEntry(zip.handle, std::string(0x10000, 'a'), &entry), kZipInvalidEntryName);
 }
 
-TEST(ZipLibrary, AFilterLongerThanAnyNameIsInvalidWithoutACall) {
+TEST(ZipLibrary, FilterOf65536BytesIsInvalidWithoutALibraryCall) {
   const std::string longer(0x10000, 'a');
   void* cookie = nullptr;
   EXPECT_EQ(StartZipIteration(nullptr, &cookie, longer, ""), kZipInvalidEntryName);
@@ -81,7 +81,7 @@ TEST(ZipLibrary, AFilterLongerThanAnyNameIsInvalidWithoutACall) {
   EXPECT_EQ(cookie, nullptr);
 }
 
-TEST(ZipLibrary, NextLeavesTheNameAloneAtTheEnd) {
+TEST(ZipLibrary, NextAtTheEndLeavesTheNameAsItWas) {
   OpenEntry zip({"a", ToBytes("x")});
   void* cookie;
   ASSERT_EQ(StartZipIteration(zip.handle, &cookie, "", ""), 0);

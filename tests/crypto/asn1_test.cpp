@@ -73,7 +73,7 @@ TEST(Asn1GetNext, ClassIsTheTopTwoBits) {
   }
 }
 
-TEST(Asn1GetNext, IndefiniteLengthReadsAsLengthZeroWithThePayloadRightAfter) {
+TEST(Asn1GetNext, IndefiniteLengthReadsAsZeroAndSetsThePayload) {
   const Bytes bytes = FromHex("30 80");
   asn1_hdr hdr = Used();
   EXPECT_EQ(Read(bytes, &hdr), 0);
@@ -89,7 +89,7 @@ TEST(Asn1GetNext, FiveLengthOctetsFail) {
   EXPECT_EQ(hdr.payload, nullptr);
 }
 
-TEST(Asn1GetNext, FourLengthOctetsAreAcceptedWhenThatManyBytesRemain) {
+TEST(Asn1GetNext, ThreeAndFourLengthOctetsAreAcceptedIfTheContentsFit) {
   const Bytes bytes = FromHex("04 84 00 00 00 01 ff");
   asn1_hdr hdr;
   EXPECT_EQ(Read(bytes, &hdr), 0);
@@ -102,7 +102,7 @@ TEST(Asn1GetNext, FourLengthOctetsAreAcceptedWhenThatManyBytesRemain) {
   EXPECT_EQ(hdr.payload, large.data() + 5);
 }
 
-TEST(Asn1GetNext, FourLengthOctetsFailWhenFewerBytesRemain) {
+TEST(Asn1GetNext, FourLengthOctetsFailIfTheContentsDoNotFit) {
   asn1_hdr hdr;
   EXPECT_EQ(Read(FromHex("04 84 00 00 00 02 ff"), &hdr), -1);
   EXPECT_EQ(Read(FromHex("04 84 ff ff ff ff ff"), &hdr), -1);
@@ -163,7 +163,7 @@ TEST(Asn1GetNext, LengthOctetsThatRunPastTheEndFail) {
   }
 }
 
-TEST(Asn1GetNext, ElementMayEndAtTheEndButNotBeyond) {
+TEST(Asn1GetNext, ElementMustEndWithinTheBytes) {
   asn1_hdr hdr;
   EXPECT_EQ(Read(FromHex("04 02 aa bb"), &hdr), 0);
   EXPECT_EQ(Read(FromHex("04 03 aa bb"), &hdr), -1);
@@ -216,7 +216,7 @@ TEST(Asn1GetNext, RemainingBytesAreCountedIn32Bits) {
   munmap(pages, kLength);
 }
 
-TEST(Asn1GetNext, NoTruncationOfALongHeaderIsReadPast) {
+TEST(Asn1GetNext, EveryTruncationFailsWithoutReadingPastTheEnd) {
   const Bytes whole = Concat({FromHex("1f 81 82 03 84 00 00 00 05"), Bytes(5, 0xaa)});
   asn1_hdr hdr;
   EXPECT_EQ(Read(whole, &hdr), 0);
@@ -235,7 +235,7 @@ TEST(Asn1GetNextBounded, LengthIsComparedWithTheBound) {
   EXPECT_EQ(asn1_get_next_bounded(bytes.data(), bytes.size(), 6, &hdr), -1);
 }
 
-TEST(Asn1GetNextBounded, HeaderMustLieInTheAvailableBytes) {
+TEST(Asn1GetNextBounded, HeaderMustEndWithinTheAvailableBytes) {
   const Bytes whole = FromHex("1f 81 01 82 00 01");
   asn1_hdr hdr;
   EXPECT_EQ(asn1_get_next_bounded(whole.data(), whole.size(), 100, &hdr), 0);
@@ -246,7 +246,7 @@ TEST(Asn1GetNextBounded, HeaderMustLieInTheAvailableBytes) {
   }
 }
 
-TEST(Asn1GetNextBounded, HeaderMustLieInTheBound) {
+TEST(Asn1GetNextBounded, HeaderMustEndWithinTheBound) {
   const Bytes bytes = FromHex("04 00");
   asn1_hdr hdr;
   EXPECT_EQ(asn1_get_next_bounded(bytes.data(), bytes.size(), 2, &hdr), 0);
@@ -262,7 +262,7 @@ TEST(Asn1ParseOid, RsaEncryptionHasSevenArcsAndPrintsAsDottedText) {
   EXPECT_EQ(Text(oid), "1.2.840.113549.1.1.1");
 }
 
-TEST(Asn1ParseOid, FirstValueOf120Is2And40) {
+TEST(Asn1ParseOid, FirstValue120GivesArcs2And40) {
   asn1_oid oid;
   const uint8_t value = 120;
   EXPECT_EQ(asn1_parse_oid(&value, 1, &oid), 0);
@@ -289,7 +289,7 @@ TEST(Asn1ParseOid, LargeFirstValueIsSplitBeforeItIsCut) {
   EXPECT_EQ(Arcs(oid), (std::vector<uint32_t>{2, 0}));
 }
 
-TEST(Asn1ParseOid, FirstValueOf2To32IsSplitAsItIs) {
+TEST(Asn1ParseOid, FirstValue2To32GivesArcs2AndFfffffb0) {
   // In groups of seven bits, 2^32 is 10000 and four groups of zeros. The second arc is 2^32 - 80 =
   // 0xffffffb0.
   const Bytes contents = FromHex("90 80 80 80 00");
@@ -354,7 +354,7 @@ TEST(Asn1GetOid, EmptyOidIsRefused) {
   EXPECT_EQ(next, nullptr);
 }
 
-TEST(Asn1GetOid, OtherElementsAreRefused) {
+TEST(Asn1GetOid, OtherOrTruncatedElementsAreRefused) {
   // Another tag, another class, an element that ends beyond the bytes, no bytes.
   for (const char* digits : {"05 01 2a", "86 01 2a", "06 02 2a", ""}) {
     const Bytes bytes = FromHex(digits);
@@ -376,7 +376,7 @@ TEST(Asn1GetOid, BadContentsFailAfterTheNextPositionIsStored) {
   EXPECT_EQ(next, long_one.data() + long_one.size());
 }
 
-TEST(Asn1OidToStr, TextThatDoesNotFitIsCutAfterTheDotOfTheThirdArc) {
+TEST(Asn1OidToStr, TextThatDoesNotFitMayBeCutAfterADot) {
   char text[6] = {'x', 'x', 'x', 'x', 'x', 'x'};
   const asn1_oid oid = OidOf({1, 2, 840});
   asn1_oid_to_str(&oid, text, 5);
@@ -405,7 +405,7 @@ TEST(Asn1OidToStr, EverySizeOfTheBufferHoldsTheStartOfTheText) {
   }
 }
 
-TEST(Asn1OidToStr, NothingIsWrittenWithoutRoom) {
+TEST(Asn1OidToStr, WritesNothingWithoutRoom) {
   char text = 'x';
   const asn1_oid oid = OidOf({1, 2});
   asn1_oid_to_str(&oid, &text, 0);
@@ -414,9 +414,11 @@ TEST(Asn1OidToStr, NothingIsWrittenWithoutRoom) {
   EXPECT_EQ(text, '\0');
 }
 
-TEST(Asn1OidToStr, NoArcsGiveAnEmptyText) { EXPECT_EQ(Text(OidOf({})), ""); }
+TEST(Asn1OidToStr, OidWithoutArcsGivesAnEmptyText) { EXPECT_EQ(Text(OidOf({})), ""); }
 
-TEST(Asn1OidToStr, ArcsPrintUnsigned) { EXPECT_EQ(Text(OidOf({2, 4294967295})), "2.4294967295"); }
+TEST(Asn1OidToStr, ArcsArePrintedAsUnsignedNumbers) {
+  EXPECT_EQ(Text(OidOf({2, 4294967295})), "2.4294967295");
+}
 
 TEST(Asn1OidToStr, LastByteOfALargerBufferIsNul) {
   char text[8] = {'x', 'x', 'x', 'x', 'x', 'x', 'x', 'x'};
@@ -433,7 +435,7 @@ TEST(Asn1BitStringToLong, LastBitOfTheFirstByteIsBitSeven) {
   EXPECT_EQ(asn1_bit_string_to_long(FromHex("00 01").data(), 2), 0x80u);
 }
 
-TEST(Asn1BitStringToLong, BytesGoUpwardsWithTheirBitsReversed) {
+TEST(Asn1BitStringToLong, FirstByteIsTheLowestAndBitsAreReversed) {
   // The bits of each byte are reversed: 0x12 = 00010010 becomes 01001000 = 0x48. In the same way,
   // 0x34 becomes 0x2c, 0x56 becomes 0x6a, and 0x78 becomes 0x1e. The first byte is the lowest.
   EXPECT_EQ(asn1_bit_string_to_long(FromHex("00 12 34 56 78").data(), 5), 0x1e6a2c48u);

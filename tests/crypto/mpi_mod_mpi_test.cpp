@@ -36,7 +36,7 @@ TEST(MpiModMpi, IsTheNonNegativeRemainder) {
   }
 }
 
-TEST(MpiModMpi, OfAZeroDivisorReturnsEighteen) {
+TEST(MpiModMpi, Returns18ForAZeroDivisor) {
   Number A({1});
   Number R({9});
   Number empty;
@@ -46,7 +46,7 @@ TEST(MpiModMpi, OfAZeroDivisorReturnsEighteen) {
   EXPECT_EQ(9, Value(R));
 }
 
-TEST(MpiModMpi, OfANegativeNumberIsNotNegativeAndBelowTheDivisor) {
+TEST(MpiModMpi, IsNotNegativeForANegativeDividend) {
   Number B({7});
   Number R;
   for (uint32_t a = 0; a < 50; ++a) {
@@ -56,7 +56,7 @@ TEST(MpiModMpi, OfANegativeNumberIsNotNegativeAndBelowTheDivisor) {
   }
 }
 
-TEST(MpiModMpi, DoesNotLookAtTheDivisorsSign) {
+TEST(MpiModMpi, IgnoresTheDivisorsSign) {
   Number A({0, 5}, -1);
   Number B({7}, -1);
   Number R;
@@ -65,7 +65,7 @@ TEST(MpiModMpi, DoesNotLookAtTheDivisorsSign) {
 }
 
 // A shift that leaves the divisor's highest bit clear would make the digit's estimate wrap here.
-TEST(MpiModMpi, EndsAtOnceForADivisorOfThirtyOneBitsAtTheTop) {
+TEST(MpiModMpi, IsRightForADivisorWithATopLimbOf31Bits) {
   Number A({0x8712b8bc, 0xffffffff, 0x4000fffe});
   Number B({0x00000001, 0x4000ffff});
   Number R;
@@ -73,7 +73,7 @@ TEST(MpiModMpi, EndsAtOnceForADivisorOfThirtyOneBitsAtTheTop) {
   EXPECT_EQ(mpz_class(Value(A) % Value(B)), Value(R));
 }
 
-TEST(MpiModMpi, EndsAtOnceForEveryTopLimb) {
+TEST(MpiModMpi, IsRightForTopLimbsOfEveryBitLength) {
   Number R;
   for (int bit = 0; bit < 32; ++bit) {
     for (uint32_t low : {0u, 1u, 0xffffu, 0xffff0000u, 0xffffffffu}) {
@@ -86,7 +86,7 @@ TEST(MpiModMpi, EndsAtOnceForEveryTopLimb) {
   }
 }
 
-TEST(MpiModMpi, OfTwoToThe8192ForAModulusOf128Limbs) {
+TEST(MpiModMpi, IsRightFor2To8192AndAModulusOf128Limbs) {
   Operands operands;
   Limbs limbs(128);
   for (uint32_t& limb : limbs) limb = operands.Limb() | 1;
@@ -103,7 +103,7 @@ TEST(MpiModMpi, OfTwoToThe8192ForAModulusOf128Limbs) {
 // d itself. This sum did not wrap and is less than 9000 * ffff, so d must be added again. Code that
 // stops after the first addition gets a digit that is far too large, and then reduces the digit by
 // one at a time, which is slow.
-TEST(MpiModMpi, EndsAtOnceIfTheRemainderEqualsTheDivisor) {
+TEST(MpiModMpi, IsFastIfTheFirstSumEqualsTheDivisorsTopLimb) {
   const Number A({0x12345678, 0x0000abcd, 0x48000000});
   const Number B({0xfedcba98, 0x8000ffff});
   Number R;

@@ -66,7 +66,7 @@ int AllocationsForExponent(const mpz_class& e) {
   return watch.calls();
 }
 
-TEST(MpiMontmul, IsTheProductOverR) {
+TEST(MpiMontmul, IsTheProductDividedByR) {
   Operands operands;
   for (int round = 0; round < kRounds; ++round) {
     const size_t n = 1 + operands.Below(round % 50 == 0 ? 40 : 6);
@@ -86,7 +86,7 @@ TEST(MpiMontmul, IsTheProductOverR) {
   }
 }
 
-TEST(MpiMontmul, TakesAFactorShorterOrLongerThanTheModulus) {
+TEST(MpiMontmul, AcceptsAFactorShorterOrLongerThanTheModulus) {
   const Number N({0xfffffff1, 0xfffffff1});
   const mpz_class modulus = Value(N);
   Limbs longer(20);
@@ -101,7 +101,7 @@ TEST(MpiMontmul, TakesAFactorShorterOrLongerThanTheModulus) {
   }
 }
 
-TEST(MpiMontmul, OfAProductThatTheModulusDividesIsZero) {
+TEST(MpiMontmul, IsZeroIfTheModulusDividesTheProduct) {
   const std::pair<uint32_t, uint32_t> cases[] = {{3, 5}, {5, 3}, {0, 7}, {7, 0}, {0, 0}};
   const Number N({15});
   for (const auto& [a, b] : cases) {
@@ -128,7 +128,7 @@ TEST(MpiMontmul, SubtractsAlsoWhereTheProductIsBelowTheModulus) {
   EXPECT_EQ(14u, T.p[1]);
 }
 
-TEST(MpiPowMod, IsRightForEveryModulusOf1To128Limbs) {
+TEST(MpiPowMod, IsRightForModuliOf1To128Limbs) {
   Operands operands;
   for (size_t n = 1; n <= 128; ++n) {
     const Limbs modulus = OddModulus(&operands, n);
@@ -152,7 +152,7 @@ TEST(MpiPowMod, IsRightForEveryWindow) {
   }
 }
 
-TEST(MpiPowMod, IsRightForTheGreatestModulusAndEveryWindow) {
+TEST(MpiPowMod, IsRightForAModulusOf128LimbsAndWideWindows) {
   Operands operands;
   const Limbs modulus = OddModulus(&operands, 128);
   for (const auto& window : kWindows)
@@ -188,7 +188,7 @@ TEST(MpiPowMod, WidensTheWindowWithTheExponent) {
   }
 }
 
-TEST(MpiPowMod, OfAnEvenModulusReturnsFour) {
+TEST(MpiPowMod, Returns4ForAnEvenModulus) {
   const Number A({3});
   const Number E({3});
   Number X({9});
@@ -199,7 +199,7 @@ TEST(MpiPowMod, OfAnEvenModulusReturnsFour) {
   EXPECT_EQ(9, Value(X));
 }
 
-TEST(MpiPowMod, OfANegativeModulusReturnsFour) {
+TEST(MpiPowMod, Returns4ForANegativeModulus) {
   const Number A({3});
   const Number E({3});
   const Number N({7}, -1);
@@ -208,12 +208,12 @@ TEST(MpiPowMod, OfANegativeModulusReturnsFour) {
   EXPECT_EQ(9, Value(X));
 }
 
-TEST(MpiPowMod, OfAModulusOfOneIsZero) {
+TEST(MpiPowMod, IsZeroForAModulusOfOne) {
   ExpectPower(5, 3, {1});
   ExpectPower(5, 0, {1, 0});
 }
 
-TEST(MpiPowMod, ToAnEmptyExponentIsOne) {
+TEST(MpiPowMod, IsOneForAnEmptyExponent) {
   const Number A({3});
   const Number E;
   const Number N({7});
@@ -222,7 +222,7 @@ TEST(MpiPowMod, ToAnEmptyExponentIsOne) {
   EXPECT_EQ(1, Value(X));
 }
 
-TEST(MpiPowMod, DoesNotLookAtTheExponentsSign) {
+TEST(MpiPowMod, IgnoresTheExponentsSign) {
   const Number A({3});
   const Number E({4}, -1);
   const Number N({101});
@@ -231,7 +231,7 @@ TEST(MpiPowMod, DoesNotLookAtTheExponentsSign) {
   EXPECT_EQ(81, Value(X));
 }
 
-TEST(MpiPowMod, IntoItsBaseGivesThePower) {
+TEST(MpiPowMod, MayStoreTheResultInTheBase) {
   Number A({3}, 1);
   const Number E({4});
   const Number N({101});

@@ -73,7 +73,7 @@ TEST(MpiGrow, WipesTheLimbsThatItReplaces) {
   EXPECT_EQ(0, watch.freed_unwiped());
 }
 
-TEST(MpiGrow, WithoutMemoryLeavesTheNumberUnchanged) {
+TEST(MpiGrow, LeavesTheNumberUnchangedWithoutMemory) {
   Number X({1, 2, 3}, -1);
   const uint32_t* const limbs = X.p;
   FailingMalloc failing(1);
@@ -108,19 +108,19 @@ TEST(MpiAssign, CopiesTheValueAndClearsTheOldLimbs) {
   }
 }
 
-TEST(MpiMsb, OfZeroIsZero) {
+TEST(MpiMsb, IsZeroForZero) {
   Number empty;
   Number zero({0, 0});
   EXPECT_EQ(0, mpi_msb(&empty));
   EXPECT_EQ(0, mpi_msb(&zero));
 }
 
-TEST(MpiMsb, OfOneIsOne) {
+TEST(MpiMsb, IsOneForOne) {
   Number one({1, 0});
   EXPECT_EQ(1, mpi_msb(&one));
 }
 
-TEST(MpiMsb, OfTwoToTheThirtyTwoIsThirtyThree) {
+TEST(MpiMsb, Is33For2To32) {
   Number X({0, 1});
   EXPECT_EQ(33, mpi_msb(&X));
 }
@@ -148,7 +148,7 @@ TEST(MpiCompare, OrdersByMagnitudeAndBySign) {
   }
 }
 
-TEST(MpiCompare, ZeroLiesBetweenTheNegativeAndThePositiveNumbers) {
+TEST(MpiCompare, ZeroIsBetweenNegativeAndPositiveNumbers) {
   for (const Limbs& zero : {Limbs{}, Limbs{0}, Limbs{0, 0}}) {
     for (const int sign : {1, -1}) {
       const Number nothing(zero, sign);
@@ -188,7 +188,7 @@ TEST(MpiBytes, AreBigEndian) {
   }
 }
 
-TEST(MpiBytes, AreHeldInNoMoreLimbsThanNeededButAtLeastOne) {
+TEST(MpiBytes, AreReadIntoTheFewestLimbsButAtLeastOne) {
   const uint8_t bytes[] = {0, 0, 1, 2, 3, 4, 5};
   Number X;
   EXPECT_EQ(0, mpi_from_bytes(&X, bytes, sizeof(bytes)));
@@ -201,7 +201,7 @@ TEST(MpiBytes, AreHeldInNoMoreLimbsThanNeededButAtLeastOne) {
   EXPECT_EQ(1, nothing.n);
 }
 
-TEST(MpiBytes, ThatDoNotHoldTheNumberAreNotWritten) {
+TEST(MpiBytes, AreNotWrittenIfTheNumberDoesNotFit) {
   Number X({0, 0x100});
   uint8_t bytes[6] = {7, 7, 7, 7, 7, 7};
   EXPECT_EQ(kMpiBufferTooSmall, mpi_to_bytes(&X, bytes, 5));
@@ -210,7 +210,7 @@ TEST(MpiBytes, ThatDoNotHoldTheNumberAreNotWritten) {
   EXPECT_EQ(1, bytes[0]);
 }
 
-TEST(MpiShiftL, ByZeroLeavesTheValue) {
+TEST(MpiShiftL, KeepsTheValueForACountOfZero) {
   Number X({5, 6, 7}, -1);
   const mpz_class before = Value(X);
   EXPECT_EQ(0, mpi_shift_l(&X, 0));
@@ -218,7 +218,7 @@ TEST(MpiShiftL, ByZeroLeavesTheValue) {
   EXPECT_EQ(3, X.n);
 }
 
-TEST(MpiShiftL, ByWholeLimbsMovesThemAndGrowsAsNeeded) {
+TEST(MpiShiftL, MovesWholeLimbsAndGrowsAsNeeded) {
   Number X({5, 6, 0}, -1);
   EXPECT_EQ(0, mpi_shift_l(&X, 32));
   EXPECT_EQ(3, X.n);
@@ -250,13 +250,13 @@ TEST(MpiShiftL, MultipliesByAPowerOfTwo) {
   }
 }
 
-TEST(MpiShiftL, ByANegativeCountChangesNothing) {
+TEST(MpiShiftL, ChangesNothingForANegativeCount) {
   Number X({5});
   for (int count : {-1, -32, INT_MIN}) EXPECT_EQ(0, mpi_shift_l(&X, count));
   EXPECT_EQ(5, Value(X));
 }
 
-TEST(MpiShiftL, BeyondAnIntsBitLengthIsMemoryExhausted) {
+TEST(MpiShiftL, ReturnsNoMemoryIfTheBitLengthDoesNotFitInAnInt) {
   Number X({1});
   FailingMalloc watch;
   EXPECT_EQ(kMpiNoMemory, mpi_shift_l(&X, INT_MAX));
@@ -264,7 +264,7 @@ TEST(MpiShiftL, BeyondAnIntsBitLengthIsMemoryExhausted) {
   EXPECT_EQ(1, Value(X));
 }
 
-TEST(MpiShiftL, OfZeroByTheGreatestCountNeedsMemory) {
+TEST(MpiShiftL, NeedsMemoryToShiftZeroByTheGreatestCount) {
   Number zero;
   FailingMalloc failing(1);
   EXPECT_EQ(kMpiNoMemory, mpi_shift_l(&zero, INT_MAX));
@@ -306,7 +306,7 @@ TEST(MpiSubAbs, SubtractsMagnitudes) {
   }
 }
 
-TEST(MpiSubAbs, OfTheGreaterMagnitudeReturnsSixteenAndChangesNothing) {
+TEST(MpiSubAbs, Returns16AndChangesNothingIfTheSubtrahendIsGreater) {
   Number A({1, 2}, -1);
   Number B({2, 2}, -1);
   Number X({9}, -1);
@@ -316,7 +316,7 @@ TEST(MpiSubAbs, OfTheGreaterMagnitudeReturnsSixteenAndChangesNothing) {
   EXPECT_EQ(-Magnitude(2, B.p), Value(B));
 }
 
-TEST(MpiSubAbs, IntoTheSubtrahendGivesTheDifference) {
+TEST(MpiSubAbs, MayStoreTheDifferenceInTheSubtrahend) {
   Number A({0, 0, 1});
   Number B({1});
   EXPECT_EQ(0, mpi_sub_abs(&B, &A, &B));
@@ -337,7 +337,7 @@ TEST(MpiMulInt, MultipliesByOneLimb) {
   }
 }
 
-TEST(MpiMulInt, GrowsToOneLimbMoreThanTheFactorHasUnlessTheOtherIsZero) {
+TEST(MpiMulInt, ResultHasOneExtraLimbUnlessTheMultiplierIsZero) {
   const Number A({1, 2, 3, 0});
   const Number empty;
   const std::tuple<const mpi*, uint32_t, int> cases[] = {
@@ -350,7 +350,7 @@ TEST(MpiMulInt, GrowsToOneLimbMoreThanTheFactorHasUnlessTheOtherIsZero) {
   }
 }
 
-TEST(MpiMulHlp, AddsAProductAndCarriesOn) {
+TEST(MpiMulHlp, AddsAProductAndPropagatesTheCarry) {
   Operands operands;
   for (int round = 0; round < kRounds; ++round) {
     const size_t count = operands.Below(40);

@@ -56,7 +56,7 @@ bool StaysInside(const GuardedBytes& block) {
 
 }  // namespace
 
-TEST(ProcessCertSigner, UnreadableHeadersGiveTheUnreadableLine) {
+TEST(ProcessCertSigner, UnreadableHeadersAreReported) {
   // No signerInfos, half of a header, a SET without its contents, no SignerInfo, no version, no
   // issuer, an issuer without its contents.
   for (const char* digits : {"", "31", "31 05", "31 00", "31 02 30 00", "31 05 30 03 02 01 01",
@@ -69,7 +69,7 @@ TEST(ProcessCertSigner, UnreadableHeadersGiveTheUnreadableLine) {
   }
 }
 
-TEST(ProcessCertSigner, SignersThatWouldStartBeyondTheEndGiveTheUnreadableLine) {
+TEST(ProcessCertSigner, SignersBeyondTheEndAreReportedAsUnreadable) {
   // The block ends with the [0] of the certificates. The length in the header of the [0] is five
   // bytes greater than its contents.
   const Bytes certificate = *WithRsaKey(Bytes(64, 0x77), {3}).certificates;
@@ -82,7 +82,7 @@ TEST(ProcessCertSigner, SignersThatWouldStartBeyondTheEndGiveTheUnreadableLine) 
 
 // The signerInfos and the first SignerInfo may each end beyond their container, but not beyond the
 // block.
-TEST(ProcessCertSigner, SignersAndTheirFirstMayEndWithTheBlock) {
+TEST(ProcessCertSigner, SignerInfosAndTheFirstSignerInfoMayEndWithTheBlock) {
   const Bytes signer = der::Sequence({der::Integer(1), der::Sequence({}), Sha256Algorithm(),
                                       AlgorithmIdentifier("1.2.3"), der::OctetString(Bytes(8, 1))});
   for (const Bytes& set : {der::Set({signer}), Concat({{0x31, 0x00}, signer})}) {
@@ -96,7 +96,7 @@ TEST(ProcessCertSigner, SignersAndTheirFirstMayEndWithTheBlock) {
   }
 }
 
-TEST(ProcessCertSigner, VersionAndIssuerMayEndWithTheBlock) {
+TEST(ProcessCertSigner, VersionAndIssuerMayFollowAnEmptySignerInfo) {
   // The SignerInfo is empty. The version and the issuer are read from the bytes after it, and the
   // digestAlgorithm is missing. In the first and the third case, the issuer ends with the block.
   // The second case is the first one with a version that is one byte longer. The fourth case is the
@@ -114,7 +114,7 @@ TEST(ProcessCertSigner, VersionAndIssuerMayEndWithTheBlock) {
   }
 }
 
-TEST(ProcessCertSigner, MalformedDigestAlgorithmGivesItsLine) {
+TEST(ProcessCertSigner, MalformedDigestAlgorithmIsReported) {
   const Bytes rest = Concat({AlgorithmIdentifier("1.2.3"), der::OctetString(Bytes(8))});
   const Bytes cases[] = {
       SignerOf({}),                                               // missing
@@ -159,7 +159,7 @@ TEST(ProcessCertSigner, AnyDigestAlgorithmAndParametersAreAccepted) {
   }
 }
 
-TEST(ProcessCertSigner, MissingEncryptedDigestGivesTheUnreadableLine) {
+TEST(ProcessCertSigner, MissingEncryptedDigestIsReportedAsUnreadable) {
   // No digestEncryptionAlgorithm, half of its header, no encryptedDigest, half of its header, and
   // half of a long-form tag.
   const Bytes algorithm = AlgorithmIdentifier("1.2.3");
@@ -172,7 +172,7 @@ TEST(ProcessCertSigner, MissingEncryptedDigestGivesTheUnreadableLine) {
   }
 }
 
-TEST(ProcessCertSigner, LastElementsAreComparedWithTheOffsetOfTheDigestAlgorithmsEnd) {
+TEST(ProcessCertSigner, EncryptedDigestIsBoundedByTheOffsetAfterDigestAlgorithm) {
   const Bytes algorithm = AlgorithmIdentifier("1.2.3");
   Bytes bytes = WithSigners(SignerOf({Sha256Algorithm(), algorithm, FromHex("04 82 00 00")}))
                     .Build(kSignatureFile);
@@ -192,7 +192,7 @@ TEST(ProcessCertSigner, LastElementsAreComparedWithTheOffsetOfTheDigestAlgorithm
   EXPECT_EQ(too_long.output, std::string(kUnreadable) + kSignerTrailer);
 }
 
-TEST(ProcessCertSigner, DigestEncryptionAlgorithmIsComparedWithTheSameOffset) {
+TEST(ProcessCertSigner, DigestEncryptionIsBoundedByTheOffsetAfterDigestAlgorithm) {
   const Bytes up_to_algorithm =
       BlockEndingInSigners(Concat({FromHex("31 80 30 14 02 01 01 30 80"), Sha256Algorithm()}));
   const size_t most = up_to_algorithm.size() - 4;  // less the element's own header
@@ -206,14 +206,14 @@ TEST(ProcessCertSigner, DigestEncryptionAlgorithmIsComparedWithTheSameOffset) {
   }
 }
 
-TEST(ProcessCertSigner, EncryptedDigestThatWouldStartBeyondTheEndGivesTheUnreadableLine) {
+TEST(ProcessCertSigner, EncryptedDigestBeyondTheEndIsReportedAsUnreadable) {
   const ProcessedBlock processed(
       WithSigners(SignerOf({Sha256Algorithm(), FromHex("30 10 06 01"), FromHex("04 01 aa")})));
   EXPECT_EQ(processed.result, 1);
   EXPECT_EQ(processed.output, std::string(kUnreadable) + kSignerTrailer);
 }
 
-TEST(ProcessCertSigner, AuthenticatedAttributesGiveTheWrongElement) {
+TEST(ProcessCertSigner, AuthenticatedAttributesGiveTheWrongEncryptedDigest) {
   SignatureBlock block;
   block.authenticated_attributes = true;
   const ProcessedBlock processed(block);
@@ -225,7 +225,7 @@ TEST(ProcessCertSigner, AuthenticatedAttributesGiveTheWrongElement) {
             Concat({der::Oid("1.2.840.113549.1.1.1"), der::Null()}));
 }
 
-TEST(ProcessCertBounds, EveryTruncationIsRefused) {
+TEST(ProcessCertDamagedBlock, EveryTruncationIsRefused) {
   const Bytes whole = WithRsaKey(Bytes(64, 0x77), {3}).Build(kSignatureFile);
   for (size_t length = 0; length < whole.size(); ++length) {
     const ProcessedBlock processed(
@@ -235,7 +235,7 @@ TEST(ProcessCertBounds, EveryTruncationIsRefused) {
   }
 }
 
-TEST(ProcessCertBounds, EveryTruncationOfABlockOfIndefiniteLengthsStaysInside) {
+TEST(ProcessCertDamagedBlock, EveryTruncationOfABlockOfIndefiniteLengthsStaysInside) {
   // By its length, the SignerInfo ends with the digestAlgorithm. The encryptedDigest may end beyond
   // the block. A block that is cut inside the encryptedDigest can therefore be accepted, so this
   // test does not check the result.
@@ -253,7 +253,7 @@ TEST(ProcessCertBounds, EveryTruncationOfABlockOfIndefiniteLengthsStaysInside) {
   }
 }
 
-TEST(ProcessCertBounds, EveryChangeOfOneByteStaysInside) {
+TEST(ProcessCertDamagedBlock, EveryChangeOfOneByteStaysInside) {
   const Bytes whole = WithRsaKey(Bytes(64, 0x77), {3}).Build(kSignatureFile);
   GuardedBytes block(whole);
   testing::internal::CaptureStdout();

@@ -39,7 +39,7 @@ TEST(ProcessCert, GoodBlockGivesKeySignaturesAndTbs) {
   }
 }
 
-TEST(ProcessCert, OnlyTheFirstCertificateIsUsed) {
+TEST(ProcessCert, BytesAfterTheFirstCertificateAreIgnored) {
   SignatureBlock block;
   block.certificates = Concat({block.SignerCertificate().Build(), Bytes(20, 0xff)});
   const ProcessedBlock processed(block);
@@ -48,7 +48,7 @@ TEST(ProcessCert, OnlyTheFirstCertificateIsUsed) {
             ModulusOf("rsa-2048"));
 }
 
-TEST(ProcessCert, LabelsOfTheOuterElementsAreNotLookedAt) {
+TEST(ProcessCert, TagsOfTheFirstTwoElementsAreNotChecked) {
   Bytes bytes = WithRsaKey(Bytes(64, 0x77), {3}).Build(kSignatureFile);
   bytes[0] = 0x04;
   ASSERT_EQ(bytes[1], 0x82);  // two octets of length, then the contentType
@@ -57,7 +57,7 @@ TEST(ProcessCert, LabelsOfTheOuterElementsAreNotLookedAt) {
   EXPECT_EQ(ProcessedBlock(bytes).result, 0);
 }
 
-TEST(ProcessCertHeader, FirstByteThatStartsNoHeaderGivesThePlainLine) {
+TEST(ProcessCertHeader, UnreadableFirstHeaderIsReportedWithoutItsTag) {
   for (const char* digits : {"ff ff ff", "30 ff", "1f 81", "30 85 00 00 00 00 00"}) {
     const ProcessedBlock processed(FromHex(digits));
     EXPECT_EQ(processed.result, 1);
@@ -66,14 +66,14 @@ TEST(ProcessCertHeader, FirstByteThatStartsNoHeaderGivesThePlainLine) {
   }
 }
 
-TEST(ProcessCertHeader, EmptyBlockGivesThePlainLine) {
+TEST(ProcessCertHeader, EmptyBlockIsReportedWithoutATag) {
   const ProcessedBlock processed{Bytes()};
   EXPECT_EQ(processed.result, 1);
   EXPECT_EQ(processed.output,
             std::string("CERT_PARCER [ERROR]: CANT PROCESS CERTIFICATE TAG\n") + kHeaderTrailer);
 }
 
-TEST(ProcessCertHeader, UnreadableContentTypeGivesThePlainLine) {
+TEST(ProcessCertHeader, UnreadableContentTypeIsReportedWithoutItsTag) {
   for (const char* digits : {"30 00", "30 01 06", "30 02 06 05"}) {
     const ProcessedBlock processed(FromHex(digits));
     EXPECT_EQ(processed.result, 1);
@@ -82,7 +82,7 @@ TEST(ProcessCertHeader, UnreadableContentTypeGivesThePlainLine) {
   }
 }
 
-TEST(ProcessCertHeader, UnreadableLaterHeadersGiveTheirTagAndTheDistanceToNull) {
+TEST(ProcessCertHeader, LaterUnreadableHeaderIsReportedWithTagAndOffsetOfNull) {
   // Each block ends after the first octet of one element. The elements are, in this order: the [0]
   // of the content, the SignedData, its version, digestAlgorithms, contentInfo, certificates.
   const std::pair<const char*, int32_t> cases[] = {
@@ -122,7 +122,7 @@ TEST(ProcessCertHeader, HeaderThatWouldStartAtOrBeyondTheEndHasTagZero) {
   }
 }
 
-TEST(ProcessCertHeader, LengthsAreComparedWithTheWholeBlockFromEachPosition) {
+TEST(ProcessCertHeader, SignedDataMayBeAsLongAsTheWholeBlock) {
   // The SignedData may end beyond the block. Its length may be at most the block's length minus the
   // 4 bytes of its own header.
   Bytes bytes = WithRsaKey(Bytes(64, 0x77), {3}).Build(kSignatureFile);
@@ -173,7 +173,7 @@ TEST(ProcessCertCertificate, SetThatRunsPastTheEndIsReadUpToTheEnd) {
             "CERT_PARCER [ERROR]: x509_certificate_parse() error -2\n");
 }
 
-TEST(ProcessCertKey, EcPointGivesTheSequenceLine) {
+TEST(ProcessCertKey, EcPointIsReportedAsAMissingSequence) {
   const Bytes point = Concat({{0x04, 0x20}, Bytes(63, 0x11)});  // 0x04, X, Y
   Certificate certificate;
   certificate.key = "ec-p256";
@@ -188,13 +188,13 @@ TEST(ProcessCertKey, EcPointGivesTheSequenceLine) {
   EXPECT_EQ(processed.record.modulus, nullptr);
 }
 
-TEST(ProcessCertKey, EcPointWhoseSecondByteIsAWrongLengthGivesTheUnreadableLine) {
+TEST(ProcessCertKey, EcPointWithAWrongLengthByteIsReportedAsUnreadable) {
   const ProcessedBlock processed(WithPublicKey(Concat({{0x04, 0x7f}, Bytes(63, 0x11)})));
   EXPECT_EQ(processed.result, 1);
   EXPECT_EQ(processed.output, std::string(kUnreadable) + kKeyTrailer);
 }
 
-TEST(ProcessCertKey, UnreadableKeyGivesTheUnreadableLine) {
+TEST(ProcessCertKey, UnreadableKeyIsReported) {
   // No bytes; half a header; a SEQUENCE that ends beyond the key; an empty SEQUENCE. Then half a
   // header of the modulus, and a modulus without its contents.
   for (const char* digits : {"", "30", "30 05 02 01 03", "30 00", "30 01 02", "30 02 02 05"}) {
@@ -206,7 +206,7 @@ TEST(ProcessCertKey, UnreadableKeyGivesTheUnreadableLine) {
 
 // The BIT STRING has only the first `length` bytes of the key. The rest follows the BIT STRING, in
 // a part of the tbsCertificate that is not read.
-TEST(ProcessCertKey, KeyEndsWithItsBitString) {
+TEST(ProcessCertKey, KeyMustEndWithinItsBitString) {
   const Bytes key = der::Sequence({der::Integer(Bytes(64, 0x77)), der::Integer(3)});
   for (size_t length = 0; length <= key.size(); ++length) {
     const auto cut = key.begin() + static_cast<ptrdiff_t>(length);
@@ -225,7 +225,7 @@ TEST(ProcessCertKey, KeyEndsWithItsBitString) {
   }
 }
 
-TEST(ProcessCertKey, ModulusEndsWithTheSequence) {
+TEST(ProcessCertKey, ModulusMustEndWithinTheSequence) {
   const Bytes exponent = der::Integer(3);
   Bytes modulus = der::Integer(Bytes(64, 0x77));
   EXPECT_EQ(ProcessedBlock(WithPublicKey(Concat({der::Sequence({modulus}), exponent}))).result, 0);
@@ -236,7 +236,7 @@ TEST(ProcessCertKey, ModulusEndsWithTheSequence) {
   EXPECT_EQ(processed.output, std::string(kUnreadable) + kKeyTrailer);
 }
 
-TEST(ProcessCertKey, ClassesAreNotLookedAt) {
+TEST(ProcessCertKey, ClassesAreNotChecked) {
   // The key is a [16] that contains two [2], in place of a SEQUENCE that contains two INTEGERs.
   const Bytes modulus(64, 0x77);
   const ProcessedBlock processed(WithPublicKey(der::Context(
@@ -245,7 +245,7 @@ TEST(ProcessCertKey, ClassesAreNotLookedAt) {
   EXPECT_EQ(Field(processed.record.modulus, processed.record.modulus_length), modulus);
 }
 
-TEST(ProcessCertKey, ModulusThatIsNotAnIntegerGivesTheIntegerLine) {
+TEST(ProcessCertKey, ModulusThatIsNotAnIntegerIsReported) {
   const ProcessedBlock processed(
       WithPublicKey(der::Sequence({der::OctetString(Bytes(64, 0x77)), der::Integer(3)})));
   EXPECT_EQ(processed.result, 1);
@@ -259,7 +259,7 @@ TEST(ProcessCertKey, ModulusThatStartsWithZeroLosesIt) {
   EXPECT_EQ(Field(processed.record.modulus, processed.record.modulus_length), Bytes(64, 0x99));
 }
 
-TEST(ProcessCertKey, ModulusThatDoesNotStartWithZeroIsTakenWhole) {
+TEST(ProcessCertKey, ModulusThatDoesNotStartWithZeroIsKeptWhole) {
   const ProcessedBlock processed(WithRsaKey(Bytes(64, 0x77), {3}));
   EXPECT_EQ(processed.result, 0);
   EXPECT_EQ(Field(processed.record.modulus, processed.record.modulus_length), Bytes(64, 0x77));
@@ -274,7 +274,7 @@ TEST(ProcessCertKey, ModulusLosesExactlyOneZero) {
 
 // In the first case, the modulus is empty and a zero byte follows it. In the second case the
 // modulus is one zero byte, and in the third case two zero bytes.
-TEST(ProcessCertKey, EmptyModulusLeavesNoRoomForTheExponent) {
+TEST(ProcessCertKey, ShortModulusLeavesNoRoomForTheExponent) {
   const std::pair<const char*, uint32_t> cases[] = {
       {"30 03 02 00 00", 0}, {"30 06 02 01 00 02 01 03", 0}, {"30 07 02 02 00 00 02 01 03", 1}};
   for (const auto& [digits, length] : cases) {
@@ -285,7 +285,7 @@ TEST(ProcessCertKey, EmptyModulusLeavesNoRoomForTheExponent) {
   }
 }
 
-TEST(ProcessCertKey, ExponentIsComparedWithTheLengthOfTheModulus) {
+TEST(ProcessCertKey, ExponentElementMayNotBeLongerThanTheModulus) {
   // The exponent has five bytes: header 02 03, contents 01 00 01.
   EXPECT_EQ(ProcessedBlock(WithRsaKey(Bytes(5, 0x77), {1, 0, 1})).result, 0);
   const ProcessedBlock processed(WithRsaKey(Bytes(4, 0x77), {1, 0, 1}));
@@ -296,7 +296,7 @@ TEST(ProcessCertKey, ExponentIsComparedWithTheLengthOfTheModulus) {
 
 // With its leading zero, the modulus has five bytes. The record leaves out the zero, but the
 // comparison counts it.
-TEST(ProcessCertKey, ExponentIsComparedWithTheLengthOfTheModulusAsWritten) {
+TEST(ProcessCertKey, ExponentMayBeAsLongAsTheModulusWithItsLeadingZero) {
   const ProcessedBlock processed(WithRsaKey(Concat({{0x00}, Bytes(4, 0x77)}), {1, 0, 1}));
   EXPECT_EQ(processed.result, 0);
   EXPECT_EQ(processed.record.modulus_length, 4u);
@@ -310,7 +310,7 @@ TEST(ProcessCertKey, ExponentMayFollowTheKey) {
   EXPECT_EQ(processed.record.exponent[0], 3);
 }
 
-TEST(ProcessCertKey, ExponentThatIsNotAnIntegerGivesTheIntegerLine) {
+TEST(ProcessCertKey, ExponentThatIsNotAnIntegerIsReported) {
   const ProcessedBlock processed(
       WithPublicKey(der::Sequence({der::Integer(Bytes(64, 0x77)), der::OctetString({3})})));
   EXPECT_EQ(processed.result, 1);
@@ -335,13 +335,13 @@ TEST(ProcessCertKey, ExponentMustBeInTheBlock) {
   EXPECT_EQ(ProcessedBlock(bytes).output, std::string(kUnreadable) + kKeyTrailer);
 }
 
-TEST(ProcessCertKey, ExponentOf65537Is01000100) {
+TEST(ProcessCertKey, ExponentOf65537IsStoredAs01000100) {
   const ProcessedBlock processed{SignatureBlock()};
   EXPECT_EQ(processed.result, 0);
   EXPECT_EQ(Field(processed.record.exponent, 4), FromHex("01 00 01 00"));
 }
 
-TEST(ProcessCertKey, ExponentIsCopiedAsItIsWithZerosBehind) {
+TEST(ProcessCertKey, ExponentIsCopiedAsItIsAndFilledWithZeros) {
   const std::pair<const char*, const char*> cases[] = {{"", "00 00 00 00"},
                                                        {"03", "03 00 00 00"},
                                                        {"00 01 00 01", "00 01 00 01"},
@@ -354,7 +354,7 @@ TEST(ProcessCertKey, ExponentIsCopiedAsItIsWithZerosBehind) {
   }
 }
 
-TEST(ProcessCertKey, ExponentEndsInZerosAlsoInAUsedRecord) {
+TEST(ProcessCertKey, ExponentIsFilledWithZerosEvenInAUsedRecord) {
   const Bytes block = WithRsaKey(Bytes(64, 0x77), {3}).Build(kSignatureFile);
   pkcs7 record;
   memset(&record, 0x11, sizeof(record));
@@ -362,7 +362,7 @@ TEST(ProcessCertKey, ExponentEndsInZerosAlsoInAUsedRecord) {
   EXPECT_EQ(Field(record.exponent, 4), FromHex("03 00 00 00"));
 }
 
-TEST(ProcessCertKey, LongerExponentRunsOnIntoTheModulusLength) {
+TEST(ProcessCertKey, LongerExponentOverwritesTheModulusLength) {
   // The modulus length is 64, 40 00 00 00 in memory.
   const std::pair<const char*, const char*> cases[] = {
       {"11 22 33 44 55", "11 22 33 44 55 00 00 00"},
@@ -377,7 +377,7 @@ TEST(ProcessCertKey, LongerExponentRunsOnIntoTheModulusLength) {
   }
 }
 
-TEST(ProcessCertKey, ExponentEndsWithTheRecord) {
+TEST(ProcessCertKey, LongExponentIsCutAfterTheModulusLength) {
   Bytes exponent(40, 0xee);
   const Bytes block = WithRsaKey(Bytes(64, 0x77), exponent).Build(kSignatureFile);
   struct {

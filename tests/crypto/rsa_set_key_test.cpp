@@ -102,7 +102,7 @@ TEST(RsaSetKey, ReadsExactlyAsManyBytesOfTheExponentAsTheModulusHas) {
   EXPECT_EQ(1024, mpi_msb(&context.E));
 }
 
-TEST(RsaSetKey, WithoutMemoryForModulusOrExponentBytesReturnsNine) {
+TEST(RsaSetKey, Returns9WithoutMemoryForModulusOrExponentBytes) {
   const Bytes modulus(128, 0xFF);
   const Bytes exponent(128, 0x03);
   for (int call : {1, 2}) {
@@ -121,7 +121,7 @@ TEST(RsaSetKey, WithoutMemoryForModulusOrExponentBytesReturnsNine) {
   EXPECT_FALSE(failing.failed());
 }
 
-TEST(RsaSetKey, WithoutMemoryForTheExponentValueLeavesItEmpty) {
+TEST(RsaSetKey, LeavesTheExponentEmptyWithoutMemoryForItsValue) {
   const Bytes modulus(128, 0xFF);
   rsa_local context;
   FailingMalloc failing(2);

@@ -28,9 +28,9 @@ Bytes Flipped(Bytes bytes, size_t index) {
   return bytes;
 }
 
-class RsaPkcs1VerifyKeys : public testing::TestWithParam<std::string> {};
+class RsaPkcs1VerifyEveryKey : public testing::TestWithParam<std::string> {};
 
-INSTANTIATE_TEST_SUITE_P(Keys, RsaPkcs1VerifyKeys,
+INSTANTIATE_TEST_SUITE_P(Keys, RsaPkcs1VerifyEveryKey,
                          testing::Values("rsa-1024", "rsa-1536", "rsa-2048", "rsa-2048-e3",
                                          "rsa-2048-e17", "rsa-3072", "rsa-4096"),
                          [](const auto& parameter) {
@@ -39,7 +39,7 @@ INSTANTIATE_TEST_SUITE_P(Keys, RsaPkcs1VerifyKeys,
                            return name;
                          });
 
-TEST_P(RsaPkcs1VerifyKeys, SignaturesOfEachDigestVerify) {
+TEST_P(RsaPkcs1VerifyEveryKey, SignaturesOfEachDigestVerify) {
   const FixedKey key(GetParam());
   LogCapture log;
   for (const auto& [nid, digest] :
@@ -131,7 +131,7 @@ TEST(RsaPkcs1Verify, Md2Md4AndUnknownAlgorithmsAreInvalidPadding) {
   }
 }
 
-TEST(RsaPkcs1Verify, EveryByteOfTheDigestInfoPrefixCounts) {
+TEST(RsaPkcs1Verify, EveryByteOfTheDigestInfoPrefixIsChecked) {
   const FixedKey key("rsa-1024");
   LogCapture log;
   for (size_t i = 0; i < 19; ++i) {
@@ -146,7 +146,7 @@ TEST(RsaPkcs1Verify, EveryByteOfTheDigestInfoPrefixCounts) {
   }
 }
 
-TEST(RsaPkcs1Verify, AnotherMdPrefixFailsSilentlyWithAnyAlgorithm) {
+TEST(RsaPkcs1Verify, WrongMdPrefixFailsSilentlyForMd5AndMd2) {
   const FixedKey key("rsa-1024");
   LogCapture log;
   for (size_t i = 0; i < 18; ++i) {
@@ -159,7 +159,7 @@ TEST(RsaPkcs1Verify, AnotherMdPrefixFailsSilentlyWithAnyAlgorithm) {
   EXPECT_EQ(log.records(), kNoRecords);
 }
 
-TEST(RsaPkcs1Verify, EveryByteOfThePaddingCounts) {
+TEST(RsaPkcs1Verify, EveryByteOfThePaddingIsChecked) {
   const FixedKey key("rsa-1024");
   const Bytes block = Block(128, kSha256Info);
   const size_t separator = 128 - 1 - kSha256Info.size();
@@ -200,7 +200,7 @@ TEST(RsaPkcs1Verify, EmptyPaddingIsAccepted) {
   EXPECT_EQ(0, Verify(key.context, key.SignBlock(block)));
 }
 
-TEST(RsaPkcs1Verify, EmptyPaddingBeforeALongerInfoIsInvalidPadding) {
+TEST(RsaPkcs1Verify, LongerInfoAfterEmptyPaddingIsInvalidPadding) {
   const SmallKey key(55);
   LogCapture log;
   const Bytes block = Block(55, Concat({kSha256Info, {0x00}}));
@@ -243,7 +243,7 @@ TEST(RsaPkcs1Verify, PaddingThatRunsToTheLastByteIsNotReadBeyondIt) {
   }
 }
 
-TEST(RsaPkcs1Verify, SeparatorThatIsTheLastByteLeavesAnInfoOfNoBytes) {
+TEST(RsaPkcs1Verify, SeparatorInTheLastByteLeavesAnEmptyInfo) {
   const FixedKey key("rsa-1024");
   LogCapture log;
   EXPECT_EQ(7,
@@ -315,7 +315,7 @@ TEST(RsaPkcs1Verify, SignatureNotBelowTheModulusIsBadInput) {
   EXPECT_EQ(log.records(), kNoRecords);
 }
 
-TEST(RsaPkcs1Verify, SignatureIsNotBelowANegativeModulus) {
+TEST(RsaPkcs1Verify, NegativeModulusIsBadInput) {
   FixedKey key("rsa-1024");
   key.context.N.s = -1;
   EXPECT_EQ(5, Verify(key.context, key.Sign(NID_sha1, kSha1)));

@@ -187,7 +187,7 @@ void ExpectAsOpensslReads(const x509_certificate& cert, const std::vector<std::s
 
 }  // namespace
 
-TEST(X509Authorities, EveryCertificateReadsAsOpensslReadsIt) {
+TEST(X509DebianCertificates, EveryCertificateIsReadAsOpensslReadsIt) {
   const std::vector<std::string> files = CertificateFiles();
   ASSERT_FALSE(files.empty()) << "no certificates in " << kDirectory;
   uint32_t extensions_seen = 0;

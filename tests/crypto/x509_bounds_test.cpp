@@ -38,7 +38,7 @@ int ResultOfExtensions(const std::vector<Bytes>& extensions) {
 
 }  // namespace
 
-TEST(X509RunningOn, CertificatesSignatureIsMinus4) {
+TEST(X509TooLongElement, CertificatesSignatureIsMinus4) {
   Certificate certificate = Unsigned();
   const Bytes good = der::BitString(Bytes(8, 0x5a));
   for (const auto& [signature, result] : {std::pair(good, 0), std::pair(RunningOn(good), -4)}) {
@@ -47,7 +47,7 @@ TEST(X509RunningOn, CertificatesSignatureIsMinus4) {
   }
 }
 
-TEST(X509RunningOn, AlgorithmsIdentifierIsMinus11OrMinus14) {
+TEST(X509TooLongElement, OidOfAnAlgorithmIsMinus11OrMinus14) {
   const Bytes good = der::Sequence({der::Oid("1.2.3")});
   const Bytes bad = der::Sequence({RunningOn(der::Oid("1.2.3"))});
   const Bytes key = der::BitString({1});
@@ -64,7 +64,7 @@ TEST(X509RunningOn, AlgorithmsIdentifierIsMinus11OrMinus14) {
   }
 }
 
-TEST(X509RunningOn, AlgorithmsParametersAreLeftEmpty) {
+TEST(X509TooLongElement, AlgorithmsParametersAreLeftEmpty) {
   Certificate certificate = Unsigned();
   const Bytes algorithm = der::Sequence({der::Oid("1.2.3"), RunningOn(der::Oid("1.2.3"))});
   certificate.tbs_algorithm = algorithm;
@@ -77,7 +77,7 @@ TEST(X509RunningOn, AlgorithmsParametersAreLeftEmpty) {
   EXPECT_EQ(parsed.cert.signature_algorithm_params_oid.len, 0u);
 }
 
-TEST(X509RunningOn, ElementsOfANameAreMinus12) {
+TEST(X509TooLongElement, ElementsOfANameAreMinus12) {
   const Bytes type = der::Oid(kCommonName);
   const Bytes attribute = der::Sequence({type, Value()});
   EXPECT_EQ(ResultOf(WithSubject(der::Sequence({der::Set({attribute})}))), 0);
@@ -97,7 +97,7 @@ TEST(X509RunningOn, ElementsOfANameAreMinus12) {
 }
 
 // The bytes that the element would use exist, but they belong to the element around its container.
-TEST(X509RunningOn, ElementsOfANameMayNotTakeBytesAfterTheirContainer) {
+TEST(X509TooLongElement, ElementsOfANameMayNotUseBytesAfterTheirContainer) {
   const Bytes type = der::Oid(kCommonName);
   const Bytes attribute = der::Sequence({type, Value()});
   const Bytes rdn = der::Set({attribute});
@@ -120,7 +120,7 @@ TEST(X509RunningOn, ElementsOfANameMayNotTakeBytesAfterTheirContainer) {
 // In the first case, the second time does not end in "Z". In the second case, its last two
 // characters are missing. The subject follows the times. It has 90 bytes of contents, so it starts
 // with 30 5a. As text, these bytes are "0Z", which would complete the time.
-TEST(X509RunningOn, TimeIsMinus13) {
+TEST(X509TooLongElement, TimeIsMinus13) {
   Certificate certificate = WithSubject(Name({{kCommonName, std::string(79, 'x')}}));
   ASSERT_EQ(certificate.subject[0], '0');
   ASSERT_EQ(certificate.subject[1], 'Z');
@@ -132,7 +132,7 @@ TEST(X509RunningOn, TimeIsMinus13) {
   EXPECT_EQ(ResultOf(certificate), -13);
 }
 
-TEST(X509RunningOn, KeyIsMinus14) {
+TEST(X509TooLongElement, KeyIsMinus14) {
   const Bytes algorithm = AlgorithmIdentifier("1.2.3");
   const Bytes key = der::BitString({1, 2, 3});
   Certificate certificate = Unsigned();
@@ -145,7 +145,7 @@ TEST(X509RunningOn, KeyIsMinus14) {
 }
 
 // All elements are in the tbsCertificate, but not in the SEQUENCE that should contain them.
-TEST(X509RunningOn, KeyBehindItsInfoIsMinus14) {
+TEST(X509TooLongElement, KeyAfterItsInfoIsMinus14) {
   const Bytes algorithm = AlgorithmIdentifier("1.2.3");
   const Bytes key = der::BitString({1, 2, 3});
   const Bytes cases[] = {
@@ -161,7 +161,7 @@ TEST(X509RunningOn, KeyBehindItsInfoIsMinus14) {
 }
 
 // An Extension follows the [3]. A SEQUENCE of extensions that is too long would include it.
-TEST(X509RunningOn, SequenceOfExtensionsIsMinus15) {
+TEST(X509TooLongElement, SequenceOfExtensionsIsMinus15) {
   const Bytes extension = Extension(kUnknown, der::Null());
   const Bytes extensions = der::Sequence({extension});
   Certificate certificate = Unsigned();
@@ -172,13 +172,13 @@ TEST(X509RunningOn, SequenceOfExtensionsIsMinus15) {
   EXPECT_EQ(ResultOf(certificate), -15);
 }
 
-TEST(X509RunningOn, ExtensionIsMinus15) {
+TEST(X509TooLongElement, ExtensionIsMinus15) {
   const Bytes extension = Extension(kUnknown, der::Null());
   EXPECT_EQ(ResultOfExtensions({extension, extension}), 0);
   EXPECT_EQ(ResultOfExtensions({extension, RunningOn(extension)}), -15);
 }
 
-TEST(X509RunningOn, ElementsOfAnExtensionAreMinus15) {
+TEST(X509TooLongElement, ElementsOfAnExtensionAreMinus15) {
   const Bytes value = der::OctetString(DigitalSignature());
   EXPECT_EQ(ResultOfExtensions({der::Sequence({der::Oid(kKeyUsage), value})}), 0);
   EXPECT_EQ(ResultOfExtensions({der::Sequence({der::Oid(kKeyUsage), RunningOn(value)})}), -15);
@@ -191,7 +191,7 @@ TEST(X509RunningOn, ElementsOfAnExtensionAreMinus15) {
   EXPECT_EQ(ResultOfExtensions({der::Sequence({id, cut}), Extension(kUnknown, {})}), -15);
 }
 
-TEST(X509RunningOn, ValueInItsOctetStringIsMinus15) {
+TEST(X509TooLongElement, ValueInItsOctetStringIsMinus15) {
   const Bytes key_usage = RunningOn(DigitalSignature());
   const Bytes constraints = der::Sequence({der::Boolean(0xff), der::Integer(3)});
   const Bytes names = der::Sequence({der::ContextPrimitive(2, ToBytes("a"))});
@@ -206,7 +206,7 @@ TEST(X509RunningOn, ValueInItsOctetStringIsMinus15) {
   EXPECT_EQ(ResultOfExtensions({with_another(RunningOn(names, another.size()))}), -15);
 }
 
-TEST(X509RunningOn, ElementsOfAValueAreMinus15) {
+TEST(X509TooLongElement, ElementsOfAValueAreMinus15) {
   const Bytes ca = der::Boolean(0xff);
   const Bytes length = der::Integer(3);
   const auto result_of = [](const std::string& oid, const Bytes& sequence) {
@@ -222,7 +222,7 @@ TEST(X509RunningOn, ElementsOfAValueAreMinus15) {
   EXPECT_EQ(result_of(kSubjectAltName, der::Sequence({RunningOn(address)})), -15);
 }
 
-TEST(X509Trailing, LoneByteInANameIsMinus12) {
+TEST(X509TrailingBytes, LoneByteInANameIsMinus12) {
   const Bytes rdn = der::Set({der::Sequence({der::Oid(kCommonName), Value()})});
   for (const uint8_t byte : {0x00, 0x31}) {
     EXPECT_EQ(ResultOf(WithSubject(der::Sequence({rdn, {byte}}))), -12);
@@ -230,20 +230,20 @@ TEST(X509Trailing, LoneByteInANameIsMinus12) {
   }
 }
 
-TEST(X509Trailing, LoneByteInTheExtensionsIsMinus15) {
+TEST(X509TrailingBytes, LoneByteInTheExtensionsIsMinus15) {
   for (const uint8_t byte : {0x00, 0x30}) {
     EXPECT_EQ(ResultOfExtensions({Extension(kUnknown, der::Null()), {byte}}), -15);
     EXPECT_EQ(ResultOfExtensions({{byte}}), -15);
   }
 }
 
-TEST(X509Trailing, LoneByteInTheAlternativeNamesIsMinus15) {
+TEST(X509TrailingBytes, LoneByteInTheAlternativeNamesIsMinus15) {
   for (const uint8_t byte : {0x00, 0x82}) {
     EXPECT_EQ(ResultOfExtensions({Extension(kSubjectAltName, der::Sequence({{byte}}))}), -15);
   }
 }
 
-TEST(X509Trailing, LoneByteAfterTheKeyIsMinus5) {
+TEST(X509TrailingBytes, LoneByteAfterTheKeyIsMinus5) {
   Certificate certificate = Unsigned();
   certificate.tbs_tail = {0xa4};
   EXPECT_EQ(ResultOf(certificate), -5);
@@ -253,7 +253,7 @@ TEST(X509Trailing, LoneByteAfterTheKeyIsMinus5) {
 }
 
 // Half of a header follows the last element that is read in each container.
-TEST(X509Trailing, BytesAfterTheLastElementThatIsReadAreIgnored) {
+TEST(X509TrailingBytes, BytesAfterTheLastElementThatIsReadAreIgnored) {
   const Bytes rest = {0x30};
   const Bytes time = der::Element(der::kUtcTime, "200102030405Z");
   const Bytes algorithm = der::Sequence({der::Oid("1.2.3"), der::Oid("1.2.4"), rest});

@@ -40,7 +40,7 @@ TEST(X509Extensions, NonCriticalExtensionWithAnUnknownOidIsSkipped) {
   EXPECT_EQ(parsed.cert.extensions_present, kX509KeyUsage);
 }
 
-TEST(X509Extensions, NeighboursOfTheUnderstoodOidsAreUnknown) {
+TEST(X509Extensions, OidsNextToTheKnownOnesAreUnknown) {
   for (const char* oid :
        {"2.5.29.14", "2.5.29.16", "2.5.29.20", "2.5.29", "2.5.28.15", "2.4.29.15", "1.5.29.15"}) {
     EXPECT_EQ(ResultOf(With({Extension(oid, DigitalSignature(), true)})), -15) << oid;
@@ -54,19 +54,19 @@ TEST(X509Extensions, ArcsAfterTheFourthMakeNoDifference) {
   EXPECT_EQ(parsed.cert.key_usage, 1u);
 }
 
-TEST(X509Extensions, UnderstoodExtensionsMayBeCritical) {
+TEST(X509Extensions, KnownExtensionMayBeCritical) {
   const ParsedCertificate parsed(With({Extension(kKeyUsage, DigitalSignature(), true)}));
   EXPECT_EQ(parsed.result, 0);
   EXPECT_EQ(parsed.cert.extensions_present, kX509KeyUsage);
 }
 
-TEST(X509Extensions, FalseWrittenOutIsRefused) {
+TEST(X509Extensions, FlagOfFalseIsMinus15) {
   const Bytes value = der::OctetString(DigitalSignature());
   EXPECT_EQ(ResultOf(With({RawExtension(kKeyUsage, Concat({der::Boolean(0), value}))})), -15);
   EXPECT_EQ(ResultOf(With({RawExtension(kKeyUsage, Concat({der::Boolean(0xff), value}))})), 0);
 }
 
-TEST(X509Extensions, TrueOfAnotherByteIsReadAsAnIdentifier) {
+TEST(X509Extensions, FlagOtherThanFfIsReadAsAnIdentifier) {
   const Bytes value = der::OctetString(DigitalSignature());
   // The parser reads the flag's byte as an identifier octet. 0x01 is that of a BOOLEAN. Each other
   // byte starts a long-form tag: the next octet, 04, is then the tag number, that of an OCTET
@@ -83,13 +83,13 @@ TEST(X509Extensions, TrueOfAnotherByteIsReadAsAnIdentifier) {
 
 // A parser that ignored the flag's length would read FF 04 04 as the header of an element of the
 // private class. Its contents, 03 02 05 A0, are a good value.
-TEST(X509Extensions, FlagOfTwoBytesOnAnUnderstoodExtensionIsMinus15) {
+TEST(X509Extensions, FlagOfTwoBytesOnAKnownExtensionIsMinus15) {
   const Bytes rest = FromHex("04 03 02 05 a0");
   EXPECT_EQ(ResultOf(With({RawExtension(kKeyUsage, Concat({FromHex("01 01 04"), rest}))})), 0);
   EXPECT_EQ(ResultOf(With({RawExtension(kKeyUsage, Concat({FromHex("01 02 ff 04"), rest}))})), -15);
 }
 
-TEST(X509Extensions, FlagOfAnyByteButZeroIsCriticalOnAnUnknownOid) {
+TEST(X509Extensions, NonzeroFlagMakesAnUnknownExtensionCritical) {
   const Bytes value = der::OctetString(DigitalSignature());
   for (const uint8_t flag : {0xdf, 0x1f, 0x04}) {
     const Bytes rest = Concat({der::Boolean(flag), flag == 4 ? FromHex("04 03 02 05 a0") : value});
@@ -98,7 +98,7 @@ TEST(X509Extensions, FlagOfAnyByteButZeroIsCriticalOnAnUnknownOid) {
   }
 }
 
-TEST(X509Extensions, HeaderAfterTheFlagStartsAtTheFlagItself) {
+TEST(X509Extensions, HeaderAfterTheFlagIsReadFromTheFlagsByte) {
   // The flag 04 and the OCTET STRING 04 03 02 05 a0 read as an OCTET STRING of the four bytes 03 02
   // 05 a0: a BIT STRING whose first and third bits are set.
   const ParsedCertificate parsed(
@@ -141,7 +141,7 @@ TEST(X509Extensions, EmptySequenceOfExtensionsIsAccepted) {
   EXPECT_EQ(ResultOf(certificate), 0);
 }
 
-TEST(X509Extensions, InAVersion2CertificateAreMinus15) {
+TEST(X509Extensions, AreMinus15InAVersion2Certificate) {
   Certificate certificate = With({Extension(kUnknown, der::Null())});
   certificate.version = der::Context(0, der::Integer(1));
   EXPECT_EQ(ResultOf(certificate), -15);
@@ -149,7 +149,7 @@ TEST(X509Extensions, InAVersion2CertificateAreMinus15) {
   EXPECT_EQ(ResultOf(certificate), 0);
 }
 
-TEST(X509Extensions, BitsOfThoseThatArePresentAreTheFirstFive) {
+TEST(X509Extensions, BitsOfExtensionsPresentAreTheFirstFive) {
   EXPECT_EQ(kX509BasicConstraints, 1u);
   EXPECT_EQ(kX509PathLenConstraint, 2u);
   EXPECT_EQ(kX509KeyUsage, 4u);
@@ -157,7 +157,7 @@ TEST(X509Extensions, BitsOfThoseThatArePresentAreTheFirstFive) {
   EXPECT_EQ(kX509IssuerAltName, 16u);
 }
 
-TEST(X509KeyUsage, NamedBitsCountFromTheFirst) {
+TEST(X509KeyUsage, NamedBitsKeepTheirNumbers) {
   // keyCertSign (5), cRLSign (6) and decipherOnly (8).
   const ParsedCertificate parsed(With({Extension(kKeyUsage, der::BitString({0x06, 0x80}, 7))}));
   EXPECT_EQ(parsed.result, 0);
@@ -165,14 +165,14 @@ TEST(X509KeyUsage, NamedBitsCountFromTheFirst) {
   EXPECT_EQ(parsed.cert.extensions_present, kX509KeyUsage);
 }
 
-TEST(X509KeyUsage, NoBitsAreStillPresent) {
+TEST(X509KeyUsage, EmptyBitStringIsPresent) {
   const ParsedCertificate parsed(With({Extension(kKeyUsage, der::BitString({}))}));
   EXPECT_EQ(parsed.result, 0);
   EXPECT_EQ(parsed.cert.key_usage, 0u);
   EXPECT_EQ(parsed.cert.extensions_present, kX509KeyUsage);
 }
 
-TEST(X509KeyUsage, MalformedIsMinus15) {
+TEST(X509KeyUsage, MalformedValueIsMinus15) {
   for (const char* digits : {"", "04 02 00 80", "83 02 00 80", "03 00", "03 05 00"}) {
     EXPECT_EQ(ResultOf(With({Extension(kKeyUsage, FromHex(digits))})), -15) << digits;
   }
@@ -204,7 +204,7 @@ TEST(X509BasicConstraints, PathLengthFollowsCa) {
   EXPECT_EQ(parsed.cert.path_len_constraint, 0x0102u);
 }
 
-TEST(X509BasicConstraints, PathLengthMayStandAlone) {
+TEST(X509BasicConstraints, PathLengthIsReadWithoutCa) {
   const ParsedCertificate parsed(
       With({Extension(kBasicConstraints, der::Sequence({der::Integer(7)}))}));
   EXPECT_EQ(parsed.result, 0);
@@ -213,7 +213,7 @@ TEST(X509BasicConstraints, PathLengthMayStandAlone) {
   EXPECT_EQ(parsed.cert.path_len_constraint, 7u);
 }
 
-TEST(X509BasicConstraints, MalformedIsMinus15) {
+TEST(X509BasicConstraints, MalformedValueIsMinus15) {
   // No element, another tag, another class. Then a first element that is unreadable, neither a
   // BOOLEAN nor an INTEGER, of another class, or a BOOLEAN of two bytes or of none. Then a second
   // element that is unreadable, of another tag or class, or again a BOOLEAN.
@@ -225,7 +225,7 @@ TEST(X509BasicConstraints, MalformedIsMinus15) {
   }
 }
 
-TEST(X509AltName, EveryKindIsKept) {
+TEST(X509AltName, FiveKindsOfNamesAreKept) {
   const ParsedCertificate parsed(With(
       {Extension(kSubjectAltName, der::Sequence({
                                       der::ContextPrimitive(1, ToBytes("a@example.com")),
@@ -254,7 +254,7 @@ TEST(X509AltName, IssuersNamesGoToTheIssuer) {
   EXPECT_EQ(parsed.cert.subject.dns, nullptr);
 }
 
-TEST(X509AltName, ALaterNameOfTheSameKindReplacesAnEarlierOne) {
+TEST(X509AltName, LaterNameReplacesAnEarlierOneOfTheSameKind) {
   const ParsedCertificate parsed(With(
       {Extension(kSubjectAltName, der::Sequence({der::ContextPrimitive(2, ToBytes("first")),
                                                  der::ContextPrimitive(2, ToBytes("second"))}))}));
@@ -281,7 +281,7 @@ TEST(X509AltName, OtherTagsAndClassesAreSkipped) {
   EXPECT_EQ(parsed.cert.subject.dns, nullptr);
 }
 
-TEST(X509AltName, NulInATextIsMinus15AndKeepsNone) {
+TEST(X509AltName, NulInATextIsMinus15AndClearsTheEarlierText) {
   const Bytes with_nul = {'a', 0, 'b'};
   for (const uint8_t tag : {1, 2, 6}) {
     const ParsedCertificate parsed(With(
@@ -306,7 +306,7 @@ TEST(X509AltName, EmptyRegisteredIdHasNoArcs) {
   EXPECT_EQ(parsed.cert.subject.rid.len, 0u);
 }
 
-TEST(X509AltName, MalformedIsMinus15) {
+TEST(X509AltName, MalformedValueIsMinus15) {
   // No SEQUENCE, another class, a name that cannot be read, a registeredID that ends within an arc.
   for (const char* oid : {kSubjectAltName, kIssuerAltName}) {
     for (const char* digits :

@@ -87,7 +87,7 @@ TEST(X509Name, OtherAttributesAreSkipped) {
   EXPECT_EQ(parsed.cert.subject.email, nullptr);
 }
 
-TEST(X509Name, EmailAddressIsNotAnEntry) {
+TEST(X509Name, EmailAddressIsKeptApartFromTheAttributes) {
   const ParsedCertificate parsed(
       WithSubject(Name({{kEmailAddress, "first"}, {kEmailAddress, "a@example.com"}})));
   ASSERT_EQ(parsed.result, 0);
@@ -112,7 +112,7 @@ TEST(X509Name, AnyUniversalValueIsAccepted) {
   }
 }
 
-TEST(X509Name, EmptyValueIsAnEntry) {
+TEST(X509Name, AttributeWithAnEmptyValueIsKept) {
   const ParsedCertificate parsed(WithSubject(Name({{kCommonName, ""}})));
   ASSERT_EQ(parsed.result, 0);
   EXPECT_EQ(parsed.cert.subject.attribute_count, 1u);
@@ -137,14 +137,14 @@ TEST(X509Name, TwentyKnownAttributesAreKept) {
   EXPECT_EQ(parsed.cert.subject.attribute_count, 20u);
 }
 
-TEST(X509Name, ATwentyFirstKnownAttributeIsMinus12) {
+TEST(X509Name, TwentyFirstKnownAttributeIsMinus12) {
   const ParsedCertificate parsed(
       WithSubject(Name(std::vector<std::pair<std::string, std::string>>(21, {kCommonName, "x"}))));
   EXPECT_EQ(parsed.result, -12);
   EXPECT_EQ(parsed.cert.subject.attribute_count, 0u);
 }
 
-TEST(X509Name, AnUnknownOrEmailAttributeAfterTwentyIsAccepted) {
+TEST(X509Name, UnknownOrEmailAttributeAfterTwentyIsAccepted) {
   std::vector<std::pair<std::string, std::string>> attributes(20, {kCommonName, "x"});
   attributes.emplace_back("2.5.4.5", "x");
   attributes.emplace_back(kEmailAddress, "a@example.com");
@@ -191,7 +191,7 @@ TEST(X509Name, MalformedNameIsMinus12) {
   }
 }
 
-TEST(X509Name, FailureClearsTheWholeNameAndNotTheOther) {
+TEST(X509Name, FailureClearsTheSubjectButNotTheIssuer) {
   const ParsedCertificate parsed(WithSubject(
       der::Sequence({Rdn(kCommonName, FromHex("0c 01 61")), Rdn(kEmailAddress, FromHex("0c 01 62")),
                      Rdn(kCommonName, FromHex("0c 01 00"))})));
@@ -215,7 +215,7 @@ TEST(X509Time, UtcTimeOf50Is1950) {
   ExpectTime(NotBefore(der::kUtcTime, "500203040506Z"), 1950, 2, 3, 4, 5, 6);
 }
 
-TEST(X509Time, UtcTimeOf00And99) {
+TEST(X509Time, UtcTimeOf00Is2000AndOf99Is1999) {
   EXPECT_EQ(NotBefore(der::kUtcTime, "000203040506Z").year, 2000);
   EXPECT_EQ(NotBefore(der::kUtcTime, "990203040506Z").year, 1999);
 }

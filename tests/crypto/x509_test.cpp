@@ -133,7 +133,7 @@ TEST(X509CertificateParse, EmptyTbsCertificateIsMinus5) {
   EXPECT_EQ(ResultOf(der::Sequence({der::Sequence({})})), -5);
 }
 
-TEST(X509Version, Version1CertificateParsesWithoutExtensionsEvenWhenTheyFollow) {
+TEST(X509Version, ExtensionsOfAVersion1CertificateAreNotRead) {
   Certificate certificate = Full();
   certificate.version = {};
   const ParsedCertificate parsed(certificate);
@@ -143,7 +143,7 @@ TEST(X509Version, Version1CertificateParsesWithoutExtensionsEvenWhenTheyFollow) 
   EXPECT_EQ(parsed.cert.extensions_present, 0u);
 }
 
-TEST(X509Version, Version1WrittenOutReadsNoExtensionsEither) {
+TEST(X509Version, ExtensionsAfterAnEncodedVersion1AreNotRead) {
   Certificate certificate = Full();
   certificate.version = der::Context(0, der::Integer(0));
   const ParsedCertificate parsed(certificate);
@@ -152,7 +152,7 @@ TEST(X509Version, Version1WrittenOutReadsNoExtensionsEither) {
   EXPECT_EQ(parsed.cert.extensions_present, 0u);
 }
 
-TEST(X509Version, Version2IsOne) {
+TEST(X509Version, Version2IsStoredAs1) {
   Certificate certificate = Unsigned();
   certificate.version = der::Context(0, der::Integer(1));
   const ParsedCertificate parsed(certificate);
@@ -166,7 +166,7 @@ TEST(X509Version, ByteOf3IsMinus9) {
   EXPECT_EQ(ResultOf(certificate), -9);
 }
 
-TEST(X509Version, OtherThanAnIntegerOfOneByteIsMinus9) {
+TEST(X509Version, IsMinus9UnlessItIsAnIntegerOfOneByte) {
   Certificate certificate = Unsigned();
   for (const char* digits :
        {"a0 04 02 02 00 02", "a0 02 02 00", "a0 03 03 01 02", "a0 03 82 01 02"}) {
@@ -183,7 +183,7 @@ TEST(X509Version, HeaderThatCannotBeReadIsMinus5) {
   EXPECT_EQ(ResultOf(certificate), -5);
 }
 
-TEST(X509Version, TagNumberIsNotLookedAt) {
+TEST(X509Version, TagNumberIsNotChecked) {
   Certificate certificate = Unsigned();
   certificate.version = der::Context(7, der::Integer(1));
   const ParsedCertificate parsed(certificate);
@@ -204,7 +204,7 @@ TEST(X509Version, SerialNumberIsReadRightAfterTheVersionNumber) {
   EXPECT_EQ(ResultOf(certificate), -10);
 }
 
-TEST(X509SerialNumber, TwentyBytesKeepTheirLastFour) {
+TEST(X509SerialNumber, LastFourOfTwentyBytesAreKept) {
   Certificate certificate = Unsigned();
   certificate.serial = der::Integer(FromHex("0102030405060708090a0b0c0d0e0f10 a1b2c3d4"));
   const ParsedCertificate parsed(certificate);
@@ -225,7 +225,7 @@ TEST(X509SerialNumber, AnyLengthIsAccepted) {
   EXPECT_EQ(many.cert.serial_number, 0x11111111u);
 }
 
-TEST(X509SerialNumber, OtherThanAUniversalIntegerIsMinus10) {
+TEST(X509SerialNumber, IsMinus10UnlessItIsAUniversalInteger) {
   Certificate certificate = Unsigned();
   for (const Bytes& version : {Bytes(), der::Context(0, der::Integer(2))}) {
     certificate.version = version;
@@ -341,7 +341,7 @@ TEST(X509OptionalFields, ExtensionsAfterASubjectUniqueIdAreNotRead) {
   EXPECT_EQ(parsed.cert.extensions_present, 0u);
 }
 
-TEST(X509OptionalFields, UniqueIdsAlone) {
+TEST(X509OptionalFields, UniqueIdsAreAcceptedWithoutExtensions) {
   Certificate certificate = Unsigned();
   certificate.issuer_unique_id = der::ContextPrimitive(1, {0, 1});
   EXPECT_EQ(ResultOf(certificate), 0);
@@ -380,7 +380,7 @@ TEST(X509OptionalFields, BytesAfterTheExtensionsAreIgnored) {
   EXPECT_EQ(Field(parsed.cert.tbs_start, parsed.cert.tbs_length), certificate.Tbs());
 }
 
-TEST(X509Signature, OtherThanABitStringIsMinus4) {
+TEST(X509Signature, IsMinus4UnlessItIsABitString) {
   Certificate certificate = Unsigned();
   for (const Bytes& signature :
        {der::OctetString({0, 1}), der::ContextPrimitive(3, {0, 1}), FromHex("03 05 00"), Bytes()}) {
@@ -389,7 +389,7 @@ TEST(X509Signature, OtherThanABitStringIsMinus4) {
   }
 }
 
-TEST(X509Signature, EmptyIsMinus5) {
+TEST(X509Signature, EmptyBitStringIsMinus5) {
   Certificate certificate = Unsigned();
   certificate.signature = der::Element(der::kBitString, Bytes());
   EXPECT_EQ(ResultOf(certificate), -5);
@@ -404,7 +404,7 @@ TEST(X509Signature, OneUnusedBitIsMinus6) {
   EXPECT_EQ(parsed.cert.serial_number, 0x1234u);
 }
 
-TEST(X509Bounds, EveryTruncationIsRefused) {
+TEST(X509DamagedCertificate, EveryTruncationIsRefused) {
   const Bytes whole = Full().Build();
   for (size_t length = 0; length < whole.size(); ++length) {
     const ParsedCertificate parsed(
@@ -413,7 +413,7 @@ TEST(X509Bounds, EveryTruncationIsRefused) {
   }
 }
 
-TEST(X509Bounds, EveryTruncationOfTheTbsCertificateIsReadNoFurther) {
+TEST(X509DamagedCertificate, TruncatedTbsCertificateFailsAndIsNotReadBeyondItsEnd) {
   Certificate certificate = Full();
   const Bytes tbs = certificate.Tbs();
   const size_t header = 4;  // 30 82 and two octets
@@ -428,7 +428,7 @@ TEST(X509Bounds, EveryTruncationOfTheTbsCertificateIsReadNoFurther) {
   }
 }
 
-TEST(X509Bounds, EveryChangeOfOneByteStaysInsideTheCertificate) {
+TEST(X509DamagedCertificate, EveryChangeOfOneByteStaysInsideTheCertificate) {
   GuardedBytes bytes(Full().Build());
   x509_certificate cert;
   for (size_t i = 0; i < bytes.size(); ++i) {

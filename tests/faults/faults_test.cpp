@@ -160,7 +160,7 @@ Installed PackageWithAnotherLibrary() {
   return Installed(MakePackage(options));
 }
 
-TEST(FaultsOfCalls, OnAGoodPackageCostTheirOwnStep) {
+TEST(FailedCalls, RemoveOnlyDependentGrantsOfAGoodPackage) {
   Installed file = GoodPackage();
   ExpectRuns(file, "LPK",
              {{"open", {"", "PK", "PK"}},     // the package; the library, to read it and to sign it
@@ -172,7 +172,7 @@ TEST(FaultsOfCalls, OnAGoodPackageCostTheirOwnStep) {
               {"fgetxattr", {}}});            // only JARs have attributes
 }
 
-TEST(FaultsOfCalls, OnATrustedJarCostTheirOwnStep) {
+TEST(FailedCalls, RemoveOnlyDependentGrantsOfATrustedJar) {
   Installed file = TrustedJar();
   ExpectRuns(file, "J",
              {{"open", {""}},
@@ -184,7 +184,7 @@ TEST(FaultsOfCalls, OnATrustedJarCostTheirOwnStep) {
               {"fgetxattr", {"J"}}});
 }
 
-TEST(FaultsOfCalls, OnABadPackageGetNothingSigned) {
+TEST(FailedCalls, LeaveABadPackageWithoutGrants) {
   Installed file = PackageWithABadDex();
   ExpectRuns(file, "",
              {{"open", {""}},
@@ -196,7 +196,7 @@ TEST(FaultsOfCalls, OnABadPackageGetNothingSigned) {
               {"fgetxattr", {}}});
 }
 
-TEST(FaultsOfCalls, OnAnotherLibraryDoNotGetItSigned) {
+TEST(FailedCalls, LeaveADifferentLibraryUnsigned) {
   Installed file = PackageWithAnotherLibrary();
   ExpectRuns(file, "P",
              {{"open", {"", "P"}},
@@ -251,7 +251,7 @@ void ExpectRunsWithoutMemory(Installed& file, const std::string& all,
   FAIL() << "memory is asked for without end";
 }
 
-TEST(FaultsOfMemory, OnAGoodPackageCostTheLaterSteps) {
+TEST(FailedAllocations, GiveAGoodPackageOnlyTheAllowedGrants) {
   Installed file = GoodPackage();
   // The meaning of the texts in the list. "": nothing is verified. "PK" and "LK": the integrity
   // value cannot be read before the first or the second signing. "LP": the permission is not found.
@@ -259,17 +259,17 @@ TEST(FaultsOfMemory, OnAGoodPackageCostTheLaterSteps) {
   ExpectRunsWithoutMemory(file, "LPK", {"", "PK", "LK", "LP", "LPN", "LPK"});
 }
 
-TEST(FaultsOfMemory, OnATrustedJarCostTheLaterSteps) {
+TEST(FailedAllocations, GiveATrustedJarOnlyTheAllowedGrants) {
   Installed file = TrustedJar();
   ExpectRunsWithoutMemory(file, "J", {"", "J"});
 }
 
-TEST(FaultsOfMemory, OnABadPackageGetNothingSigned) {
+TEST(FailedAllocations, LeaveABadPackageWithoutGrants) {
   Installed file = PackageWithABadDex();
   ExpectRunsWithoutMemory(file, "", {""});
 }
 
-TEST(FaultsOfMemory, OnAnotherLibraryDoNotGetItSigned) {
+TEST(FailedAllocations, LeaveADifferentLibraryUnsigned) {
   Installed file = PackageWithAnotherLibrary();
   ExpectRunsWithoutMemory(file, "P", {"", "P"});
 }

@@ -36,13 +36,13 @@ void Expect(const RunResult& run, RunEnd end, int value) {
   EXPECT_EQ(run.value, value);
 }
 
-TEST(RunProgram, TellsTheExitStatus) {
+TEST(RunProgram, ReturnsTheExitStatus) {
   Expect(Shell("exit 0"), RunEnd::kExited, 0);
   Expect(Shell("exit 1"), RunEnd::kExited, 1);
   Expect(RunProgram({"/bin/false"}, {}), RunEnd::kExited, 1);
 }
 
-TEST(RunProgram, HandsOverEachArgument) {
+TEST(RunProgram, PassesEachArgument) {
   EXPECT_EQ(Printed("echo \"$#\""), "0\n");
   const TempDir directory;
   const std::string file = directory / "output";
@@ -50,7 +50,7 @@ TEST(RunProgram, HandsOverEachArgument) {
   EXPECT_EQ(ContentOf(file), "a b||*|");
 }
 
-TEST(RunProgram, TellsTheSignal) {
+TEST(RunProgram, ReturnsTheSignal) {
   Expect(Shell("kill -ABRT $$"), RunEnd::kKilled, SIGABRT);
   Expect(Shell("kill -KILL $$"), RunEnd::kKilled, SIGKILL);
 }
@@ -66,13 +66,13 @@ TEST(RunProgram, KillsAProgramThatTakesTooLong) {
   EXPECT_EQ(waitpid(-1, nullptr, WNOHANG), -1);  // the child process is gone
 }
 
-TEST(RunProgram, LeavesAProgramThatEndsInTimeAlone) {
+TEST(RunProgram, DoesNotKillAProgramThatEndsInTime) {
   RunLimits limits;
   limits.milliseconds = 20000;
   Expect(RunProgram({"/bin/sleep", "0.3"}, limits), RunEnd::kExited, 0);
 }
 
-TEST(RunProgram, ThatIsMissingIsNotStarted) {
+TEST(RunProgram, MissingOrNonExecutableFileIsNotStarted) {
   Expect(RunProgram({"/nowhere/apktoolkit"}, {}), RunEnd::kNotStarted, 0);
   Expect(RunProgram({"/dev/null"}, {}), RunEnd::kNotStarted, 0);
 }
@@ -87,7 +87,7 @@ std::string Streams() {
   return ContentOf(file);
 }
 
-TEST(RunProgram, HasNullForItsStreamsAndNothingElseOpen) {
+TEST(RunProgram, ProgramHasDevNullStreamsAndNoOtherDescriptors) {
   const int inherited = open("/dev/null", O_RDONLY);  // without O_CLOEXEC
   EXPECT_EQ(Streams(), "/dev/null\n/dev/null\n/dev/null\n");
   EXPECT_EQ(Printed("ls /proc/self/fd"), "0\n1\n2\n3\n");  // 3: the directory that ls reads
@@ -95,7 +95,7 @@ TEST(RunProgram, HasNullForItsStreamsAndNothingElseOpen) {
 }
 
 // A daemon may run without standard streams.
-TEST(RunProgram, HasItsStreamsEvenIfThisProcessHasNone) {
+TEST(RunProgram, ProgramHasItsStreamsEvenIfThisProcessHasNone) {
   std::string streams;
   {
     const FreeDescriptor input(STDIN_FILENO), output(STDOUT_FILENO), errors(STDERR_FILENO);
@@ -105,7 +105,7 @@ TEST(RunProgram, HasItsStreamsEvenIfThisProcessHasNone) {
 }
 
 // Runs cp, because a shell would unblock signals itself.
-TEST(RunProgram, HasNoSignalBlocked) {
+TEST(RunProgram, ProgramHasNoBlockedSignals) {
   sigset_t some, before;
   sigemptyset(&some);
   sigaddset(&some, SIGTERM);
@@ -117,7 +117,7 @@ TEST(RunProgram, HasNoSignalBlocked) {
   EXPECT_NE(ContentOf(file).find("\nSigBlk:\t0000000000000000\n"), std::string::npos);
 }
 
-TEST(RunProgram, LimitsWrittenMemory) {
+TEST(RunProgram, LimitsWritableMemory) {
   if (AreProgramsEmulated()) GTEST_SKIP() << "the emulator limits no memory";
   RunLimits limits;
   limits.memory_bytes = size_t{64} << 20;
@@ -130,7 +130,7 @@ TEST(RunProgram, LimitsWrittenMemory) {
                                               : std::to_string(own.rlim_cur / 1024) + "\n");
 }
 
-TEST(RunProgram, WithoutDescriptorsIsNotStarted) {
+TEST(RunProgram, ReturnsNotStartedWithoutDescriptors) {
   rlimit before = {};
   getrlimit(RLIMIT_NOFILE, &before);
   const rlimit none = {0, before.rlim_max};
@@ -141,7 +141,7 @@ TEST(RunProgram, WithoutDescriptorsIsNotStarted) {
 }
 
 // While SIGCHLD is ignored, the kernel discards the child's exit status.
-TEST(RunProgram, WhoseStatusAnotherCallTookIsLost) {
+TEST(RunProgram, ReturnsLostIfSigchldIsIgnored) {
   const auto before = signal(SIGCHLD, SIG_IGN);
   Expect(RunProgram({"/bin/true"}, {}), RunEnd::kLost, ECHILD);
   signal(SIGCHLD, before);

@@ -61,7 +61,7 @@ TEST_F(Phone, SignsAPackageOnce) {
   EXPECT_EQ(Sign(package), SignOutcome::kTrustedAlready);
 }
 
-TEST_F(Phone, LeavesAPackageOfAnotherSignerAlone) {
+TEST_F(Phone, DoesNotSignAPackageOfAnotherSigner) {
   InstalledPackage package = Install("apksigner-sha256-2048");
   package.signer_digests = Install("apksigner-sha256-4096").signer_digests;
   EXPECT_EQ(Sign(package), SignOutcome::kOtherSigner);
@@ -69,7 +69,7 @@ TEST_F(Phone, LeavesAPackageOfAnotherSignerAlone) {
   EXPECT_FALSE(IsTrusted(fs::path(package.path).parent_path() / "lib/arm64/libvault.so"));
 }
 
-TEST_F(Phone, LeavesAPackageWithoutAJarSignatureAlone) {
+TEST_F(Phone, DoesNotSignAPackageWithoutAJarSignature) {
   const InstalledPackage package = Install("apksigner-newer-only");
   EXPECT_EQ(Sign(package), SignOutcome::kNoJarSigner);
   EXPECT_FALSE(IsTrusted(package.path));
@@ -95,12 +95,12 @@ TEST_F(Phone, EndsARunThatTakesTooLong) {
   EXPECT_EQ(Sign(Install("apksigner-sha256-2048"), limits), SignOutcome::kTimedOut);
 }
 
-TEST_F(Phone, TellsOfARunThatEndsWithoutMemory) {
+TEST_F(Phone, ReportsAnAbortedRunAsOutOfMemory) {
   InstallProgram("apktoolkit", "kill -ABRT $$; exit");
   EXPECT_EQ(Sign(Install("apksigner-sha256-2048")), SignOutcome::kOutOfMemory);
 }
 
-TEST_F(Phone, TellsOfProgramsThatAreMissing) {
+TEST_F(Phone, ReportsMissingPrograms) {
   const InstalledPackage package = Install("apksigner-sha256-2048");
   fs::remove(bin_ / "apktoolkit");
   EXPECT_EQ(Sign(package), SignOutcome::kCannotBeRun);
@@ -122,7 +122,7 @@ class AfterAnUpdate : public Phone {
   }
 };
 
-TEST_F(AfterAnUpdate, EveryPackageIsSignedAndToldOf) {
+TEST_F(AfterAnUpdate, EveryPackageIsSignedAndReported) {
   const InstalledPackage first = Install("apksigner-sha256-2048");
   const InstalledPackage second = Install("apksigner-sha256-4096");
   ProcessResult run = SignAll(Line(first) + Line(second));
@@ -136,7 +136,7 @@ TEST_F(AfterAnUpdate, EveryPackageIsSignedAndToldOf) {
   EXPECT_EQ(run.status, 0);
 }
 
-TEST_F(AfterAnUpdate, OneThatIsRefusedKeepsNoOtherFromBeingSigned) {
+TEST_F(AfterAnUpdate, RefusedPackagesDoNotStopTheOthers) {
   InstalledPackage other = Install("apksigner-sha1-2048");
   other.signer_digests = std::string(64, '0');
   const InstalledPackage none = {Install("apksigner-newer-only").path, ""};
@@ -149,7 +149,7 @@ TEST_F(AfterAnUpdate, OneThatIsRefusedKeepsNoOtherFromBeingSigned) {
   EXPECT_EQ(run.status, 1);
 }
 
-TEST_F(AfterAnUpdate, WrongLinesAreToldOfAndPassedOver) {
+TEST_F(AfterAnUpdate, WrongLinesAreReportedAndSkipped) {
   const InstalledPackage good = Install("apksigner-sha256-2048");
   const ProcessResult run = SignAll("nonsense\n\nabc relative/base.apk\n" + Line(good));
   EXPECT_EQ(run.output, good.path + ": trusted\n");
@@ -161,7 +161,7 @@ TEST_F(AfterAnUpdate, WrongLinesAreToldOfAndPassedOver) {
   EXPECT_EQ(run.status, 2);
 }
 
-TEST(All, NeedsTheProgramsAndAList) {
+TEST(ApktoolkitAll, NeedsADirectoryAndAReadableList) {
   for (const std::vector<std::string>& words : std::vector<std::vector<std::string>>{
            {}, {"/system/bin"}, {"/system/bin", "/dev/null", "/dev/null"}}) {
     std::vector<std::string> command = {APKTOOLKIT_ALL_PATH};

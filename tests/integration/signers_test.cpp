@@ -73,7 +73,7 @@ class PackageWithTwoFaces : public testing::Test {
   const std::string apk_;
 };
 
-TEST_F(PackageWithTwoFaces, IsTheAttackersToThePackageManager) {
+TEST_F(PackageWithTwoFaces, ShowsTheAttackersKeyToThePackageManager) {
   EXPECT_EQ(SignersOf(apk_, 27), DigestOfKey("openssl-cms-issued"));
   EXPECT_EQ(SignersOf(apk_, 33), DigestOfKey("openssl-cms-issued"));
 }
@@ -90,7 +90,7 @@ TEST_F(PackageWithTwoFaces, IsNotGivenToTheTool) {
       << run.errors;
 }
 
-TEST_F(PackageWithTwoFaces, IsNotBoundByTheJavaSideEither) {
+TEST_F(PackageWithTwoFaces, IsRejectedByTheJavaSideToo) {
   const std::string jar_signer = DigestOfKey("apksigner-sha256-2048");
   EXPECT_EQ(PackageManager(33, apk_, {jar_signer}).output, "false\n");
   const std::string good = Golden("apksigner-sha256-2048/base.apk");
@@ -134,7 +134,7 @@ TEST(Signers, RetiredKeyIsNotASigner) {
 }
 
 // Like the tool, apktoolkit-bound reads a leased package after the holder gives up the lease.
-TEST(Signers, OfALeasedPackageAreWaitedFor) {
+TEST(Signers, LeasedPackageIsReadAfterTheLeaseIsGivenUp) {
   const TempDir directory;
   const std::string apk = directory / "base.apk";
   fs::copy_file(Golden("apksigner-sha256-2048/base.apk"), apk);
@@ -144,13 +144,13 @@ TEST(Signers, OfALeasedPackageAreWaitedFor) {
   EXPECT_TRUE(lease.WasGivenUp());
 }
 
-TEST(Signers, ThatAreNotRsaHaveNoDigest) {
+TEST(Signers, EcSignerHasNoDigest) {
   const std::string apk = Golden("apksigner-ec/base.apk");
   EXPECT_EQ(SignersOf(apk), "");
   ExpectNotRun(kNoJarSigner, "", apk);
 }
 
-TEST(Signers, OfFilesWithoutAGoodJarSignatureAreEmpty) {
+TEST(Signers, FileWithoutAGoodJarSignatureHasNoJarSigner) {
   const TempDir directory;
   const std::string text = directory.Write("text", ToBytes("no archive"));
   PackageOptions jar;
@@ -177,7 +177,7 @@ TEST(Signers, AreComparedAsWholeDigests) {
   ExpectRun("," + key + ",", apk);
 }
 
-TEST(Bound, RunsNothingButTheCommand) {
+TEST(ApktoolkitBound, ReturnsTheCommandsStatusOrItsOwnError) {
   const std::string apk = Golden("apksigner-sha256-2048/base.apk");
   const std::string key = DigestOfKey("apksigner-sha256-2048");
   EXPECT_EQ(RunProcess({APKTOOLKIT_BOUND_PATH, key, "/nowhere/apktoolkit", apk}).status,
@@ -186,7 +186,7 @@ TEST(Bound, RunsNothingButTheCommand) {
   EXPECT_EQ(RunProcess({APKTOOLKIT_BOUND_PATH, key, "/bin/false", apk}).status, 1);
 }
 
-TEST(Bound, LeavesNothingOpenForTheCommand) {
+TEST(ApktoolkitBound, PassesOnlyTheStandardDescriptorsToTheCommand) {
   const ProcessResult run =
       RunProcess({APKTOOLKIT_BOUND_PATH, DigestOfKey("apksigner-sha256-2048"), "/bin/sh", "-c",
                   "ls /proc/self/fd", Golden("apksigner-sha256-2048/base.apk")});
@@ -194,7 +194,7 @@ TEST(Bound, LeavesNothingOpenForTheCommand) {
 }
 
 // Descriptor 3 is free for the tool, as when the tool is started directly.
-TEST(Bound, HasTheToolSign) {
+TEST(ApktoolkitBound, LetsTheToolSignThePackage) {
   const std::string apk = Golden("apksigner-sha256-2048/base.apk");
   const ProcessResult run = RunProcess({APKTOOLKIT_BOUND_PATH, DigestOfKey("apksigner-sha256-2048"),
                                         SimulatorPath(), "--quiet", apk});

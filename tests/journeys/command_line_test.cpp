@@ -34,11 +34,11 @@ void ExpectUsageError(const std::vector<std::string>& arguments) {
   EXPECT_EQ(run.errors, "");
 }
 
-TEST_F(CommandLine, WithoutAPathIsAUsageError) { ExpectUsageError({}); }
+TEST_F(CommandLine, MissingPathIsAUsageError) { ExpectUsageError({}); }
 
-TEST_F(CommandLine, WithTwoPathsIsAUsageError) { ExpectUsageError({apk_, apk_}); }
+TEST_F(CommandLine, TwoPathsAreAUsageError) { ExpectUsageError({apk_, apk_}); }
 
-TEST_F(CommandLine, MissingFileEndsSilently) {
+TEST_F(CommandLine, MissingFileEndsTheRunSilently) {
   const Simulation run = Simulate(directory_ / "none.apk");
 
   EXPECT_EQ(run.timeline, Exit(0));
@@ -46,7 +46,7 @@ TEST_F(CommandLine, MissingFileEndsSilently) {
 }
 
 // In its own user namespace, the tool has no right to another user's files, even as root.
-TEST_F(CommandLine, FileThatMayNotBeReadEndsSilently) {
+TEST_F(CommandLine, UnreadableFileEndsTheRunSilently) {
   if (!CanMakeNamespaces()) GTEST_SKIP() << kNoNamespaces;
   std::filesystem::permissions(apk_, std::filesystem::perms::none);
 
@@ -56,7 +56,7 @@ TEST_F(CommandLine, FileThatMayNotBeReadEndsSilently) {
   EXPECT_EQ(run.status, 4);  // the file was not looked at
 }
 
-TEST_F(CommandLine, FileOnAReadOnlyFileSystemEndsSilently) {
+TEST_F(CommandLine, FileOnAReadOnlyFileSystemEndsTheRunSilently) {
   if (!CanMakeNamespaces()) GTEST_SKIP() << kNoNamespaces;
   const TempDir mount_point;
   const std::string apk = mount_point / "base.apk";
@@ -68,7 +68,7 @@ TEST_F(CommandLine, FileOnAReadOnlyFileSystemEndsSilently) {
   EXPECT_EQ(run.status, 4);  // the file was not looked at
 }
 
-TEST_F(CommandLine, FileOnTheSameFileSystemWritableIsWorkedOn) {
+TEST_F(CommandLine, FileOnAWritableFileSystemIsSigned) {
   if (!CanMakeNamespaces()) GTEST_SKIP() << kNoNamespaces;
   const TempDir mount_point;
   const std::string apk = mount_point / "base.apk";
@@ -94,7 +94,7 @@ std::string WorkstationLog(const std::string& errors) {
       "$1$2 ");
 }
 
-TEST_F(CommandLine, WithoutASimulatedPhoneNothingCanBeSigned) {
+TEST_F(CommandLine, RunWithoutASimulatedPhoneSignsNothing) {
   PackageOptions options;
   options.secure_storage = true;
   MakePackage(options).WriteTo(apk_);

@@ -96,7 +96,7 @@ Lines WarningsOf(const Package& package, const Lines& options = {}) {
 
 }  // namespace
 
-TEST(Signer, IsTakenByEachDigestThatToolsPrint) {
+TEST(Signer, MatchesEachDigestThatToolsPrint) {
   for (const std::string& digest :
        {CertificateDigest("rsa-2048"), PublicKeyDigest("rsa-2048"), ModulusDigest("rsa-2048")}) {
     EXPECT_EQ(Verdicts({"--signer", digest, Apk("apksigner-sha256-2048")}),
@@ -109,7 +109,7 @@ TEST(Signer, IsTakenByEachDigestThatToolsPrint) {
             Lines({"SIGNED", "NOT ACCEPTED", "-> 1"}));
 }
 
-TEST(Signer, WhoWasNotExpectedStandsInFirstLineItemAndJournal) {
+TEST(Signer, UnexpectedSignerIsShownInTextAndJournal) {
   const std::string expected = ModulusDigest("rsa-4096"), actual = ModulusDigest("rsa-2048");
   const Lines words = {"--installer=off", "--signer", expected, Apk("apksigner-sha256-2048")};
   const std::string text = Simulated(words).output;
@@ -129,7 +129,7 @@ TEST(Signer, WhoWasNotExpectedStandsInFirstLineItemAndJournal) {
 
 // For phones of API 28 and later, the signer of the package rotated-key has the second key, but the
 // kernel gets the first key.
-TEST(Signer, OfTheNewestSchemeIsAskedOfTheInstaller) {
+TEST(Signer, KeyOfANewerSchemeMustBeExpectedToo) {
   const Lines first = {"--signer", ModulusDigest("rsa-2048")};
   const auto verdicts = [&](const Lines& more) {
     Lines words = first;
@@ -146,13 +146,13 @@ TEST(Signer, OfTheNewestSchemeIsAskedOfTheInstaller) {
   EXPECT_EQ(verdicts({"--signer", ModulusDigest("rsa-2048-other")}), Lines({"SIGNED", "-> 0"}));
 }
 
-TEST(Signer, OfARefusedPackageIsNotKnown) {
+TEST(Signer, IsNotVerifiedInARefusedPackage) {
   const Lines words = {"--signer", ModulusDigest("rsa-2048"), Apk("changed-dex")};
   EXPECT_EQ(Verdicts(words), Lines({"REFUSED", "-> 1"}));
   EXPECT_EQ(Events(words).at(0)["items"].back()["reason"], "signer-not-verified");
 }
 
-TEST(Signer, OfATrustedJarIsNobody) {
+TEST(Signer, TrustedJarMatchesNoExpectedSigner) {
   const TempDir directory;
   const std::string jar = directory / "a.jar";
   MakePackage(PlainJar()).WriteTo(jar);
@@ -188,7 +188,7 @@ TEST(Werror, WarningsCountAsRefusals) {
             Lines({"NOT ACCEPTED", "-> 1"}));
 }
 
-TEST(Warning, OfWeakDigestsNamesEachUse) {
+TEST(Warning, NamesEachUseOfAWeakDigest) {
   const auto text = [](const std::string& name) {
     const json warnings = Events({Apk(name)}).at(0)["warnings"];
     for (const json& warning : warnings) {
@@ -206,7 +206,7 @@ TEST(Warning, OfWeakDigestsNamesEachUse) {
   EXPECT_EQ(Events({Apk("jarsigner-sha256")}).at(0)["warnings"], json::array());
 }
 
-TEST(Warning, OfAnExpiredCertificate) {
+TEST(Warning, AppearsForAnExpiredCertificate) {
   const auto warnings = [](const std::string& end) {
     PackageOptions options;
     Certificate certificate = options.block.SignerCertificate();
@@ -219,7 +219,7 @@ TEST(Warning, OfAnExpiredCertificate) {
   EXPECT_EQ(warnings("490102030405Z"), Lines());
 }
 
-TEST(Warning, OfAShortKeyOrADebugCertificate) {
+TEST(Warning, AppearsForShortKeyOrDebugCertificate) {
   PackageOptions options;
   EXPECT_EQ(WarningsOf(MakePackage(options)), Lines());
   options.block.key = "rsa-1024";
@@ -232,7 +232,7 @@ TEST(Warning, OfAShortKeyOrADebugCertificate) {
 }
 
 // The expected values are those of coreutils and openssl.
-TEST(Verdict, TellsWhatAProgramHasToKnowOfFileToolAndSigner) {
+TEST(Verdict, DescribesFileToolSignerAndCure) {
   const auto sha256 = [](const std::string& file) {
     return RunProcess({"sha256sum", file}).output.substr(0, 64);
   };
@@ -259,7 +259,7 @@ TEST(Verdict, TellsWhatAProgramHasToKnowOfFileToolAndSigner) {
   EXPECT_EQ(other["tool"]["sha256"], sha256(tool));
 }
 
-TEST(Journal, OnStandardOutputIsAllThatStandsThere) {
+TEST(Journal, IsAloneOnStandardOutput) {
   const std::string apk = Apk("apksigner-sha256-2048");
   const ProcessResult run = Simulated({"--installer=off", "--journal", "-", apk});
   EXPECT_EQ(run.status, 0);

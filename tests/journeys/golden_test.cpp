@@ -129,18 +129,18 @@ INSTANTIATE_TEST_SUITE_P(By, BlockWithAttributes,
                                          "openssl-cms-attributes"),
                          TestName);
 
-TEST(RefusedGoldenPackage, SignedWithALongerDigestHasInvalidPadding) {
+TEST(RefusedGoldenPackage, HasInvalidPaddingIfSignedOverSha512) {
   ExpectRefusalAfter("openssl-cms-sha512",
                      {Log(6, "Invalid padding in RSA"), Log(6, "RSA could not verify data: 7\n"),
                       Log(6, "file not verified: META-INF/CERT.SF\n")});
 }
 
-TEST(RefusedGoldenPackage, WithACertificateThatAnotherIssuedIsRefused) {
+TEST(RefusedGoldenPackage, CertificateOfAnotherIssuerIsRefused) {
   ExpectRefusalAfter("openssl-cms-issued", {Log(6, "RSA could not verify certificate: 7\n"),
                                             Log(6, "file not verified: META-INF/CERT.SF\n")});
 }
 
-TEST(RefusedGoldenPackage, SignedWithAnEllipticCurveHasNoRsaBlock) {
+TEST(RefusedGoldenPackage, HasNoRsaBlockIfSignedWithAnEcKey) {
   ExpectRefusalAfter("apksigner-ec",
                      {Log(6, "Can't extract RSA certificate: META-INF/CERT.RSA\n")});
 }

@@ -48,7 +48,7 @@ TEST(GoodPackage, LibraryIsSignedThenThePackageThenItsKeyIsRegistered) {
   EXPECT_EQ(run.status, 0);
 }
 
-TEST(GoodPackage, WithoutThePermissionItIsNotRegistered) {
+TEST(GoodPackage, IsNotRegisteredWithoutThePermission) {
   const TempDir directory;
   const std::string apk = directory / "base.apk";
   const std::string library = directory.Write("lib/arm64/libfoo.so", kLibrary);
@@ -61,7 +61,7 @@ TEST(GoodPackage, WithoutThePermissionItIsNotRegistered) {
   EXPECT_EQ(run.status, 0);
 }
 
-TEST(GoodPackage, WithoutLibrariesOnlyThePackageIsSigned) {
+TEST(GoodPackage, IsSignedAloneIfItHasNoLibraries) {
   const TempDir directory;
   const std::string apk = directory / "base.apk";
   PackageOptions options;
@@ -74,7 +74,7 @@ TEST(GoodPackage, WithoutLibrariesOnlyThePackageIsSigned) {
   EXPECT_EQ(run.status, 0);
 }
 
-TEST(GoodPackage, WithoutADexFileIsGood) {
+TEST(GoodPackage, IsSignedEvenWithoutADexFile) {
   const TempDir directory;
   const std::string apk = directory / "base.apk";
   PackageOptions options;
@@ -97,7 +97,7 @@ void PrintTo(const Row& row, std::ostream* out) { *out << row.entry_name; }
 
 class LibraryDirectory : public testing::TestWithParam<Row> {};
 
-TEST_P(LibraryDirectory, IsWhereTheEntryIsSigned) {
+TEST_P(LibraryDirectory, ContainsTheSignedLibrary) {
   const TempDir directory;
   const std::string apk = directory / "base.apk";
   const std::string library = directory.Write(GetParam().installed, kLibrary);
@@ -120,9 +120,9 @@ INSTANTIATE_TEST_SUITE_P(
                         "lib/armX/libfoo.so"}),
     [](const auto& row) { return row.param.description; });
 
-class NoLibrary : public testing::TestWithParam<Row> {};
+class EntryThatIsNotALibrary : public testing::TestWithParam<Row> {};
 
-TEST_P(NoLibrary, IsPassedOverSilently) {
+TEST_P(EntryThatIsNotALibrary, IsSkippedSilently) {
   const TempDir directory;
   const std::string apk = directory / "base.apk";
   directory.Write(GetParam().installed, kLibrary);
@@ -135,13 +135,13 @@ TEST_P(NoLibrary, IsPassedOverSilently) {
 }
 
 INSTANTIATE_TEST_SUITE_P(
-    Rows, NoLibrary,
+    Rows, EntryThatIsNotALibrary,
     testing::Values(Row{"OtherProcessor", "lib/x86/libfoo.so", "lib/x86/libfoo.so"},
                     Row{"OtherSuffix", "lib/arm64-v8a/libfoo.so.1", "lib/arm64/libfoo.so.1"},
                     Row{"OtherDirectory", "assets/lib/arm64-v8a/libfoo.so", "lib/arm64/libfoo.so"}),
     [](const auto& row) { return row.param.description; });
 
-TEST(GoodPackage, NamedWithoutADirectoryIsFoundThroughItsDescriptor) {
+TEST(GoodPackage, IsFoundThroughItsDescriptorIfNamedWithoutADirectory) {
   const TempDir directory;
   const std::string apk = directory / "base.apk";
   const std::string library = directory.Write("lib/arm64/libfoo.so", kLibrary);
@@ -154,7 +154,7 @@ TEST(GoodPackage, NamedWithoutADirectoryIsFoundThroughItsDescriptor) {
   EXPECT_EQ(run.status, 0);
 }
 
-TEST(GoodPackage, ReachedThroughALinkHasItsLibrariesBesideTheFileItself) {
+TEST(GoodPackage, LinkLeadsToTheLibrariesBesideItsTarget) {
   const TempDir directory;
   const std::string apk = directory / "base.apk";
   const std::string library = directory.Write("lib/arm64/libfoo.so", kLibrary);

@@ -50,7 +50,7 @@ json VerdictOf(const std::string& name, Lines options = {}) {
 
 }  // namespace
 
-TEST(Installer, TakesWhatApksignerSigned) {
+TEST(Installer, AcceptsWhatApksignerSigned) {
   EXPECT_EQ(Told("apksigner-sha256-2048"),
             Lines({"SIGNED", "phones of API 27 and later install it, verified by v2, v3", "-> 0"}));
   EXPECT_EQ(Told("v1-alone"),
@@ -83,7 +83,7 @@ TEST(Installer, RefusesALibraryChangedInsideThePackage) {
                    "-> 1"}));
 }
 
-TEST(Entries, AreComparedByTheToolsOwnCodeWhereNobodyAsksAnInstaller) {
+TEST(PackageEntries, AreComparedEvenIfNoInstallerIsAsked) {
   const json event = VerdictOf("foreign-manifest", {"--installer=off"});
   EXPECT_EQ(event["verdict"], "signed");
   EXPECT_EQ(event["entries"]["differing"]["names"], json({"AndroidManifest.xml"}));
@@ -99,7 +99,7 @@ TEST(Entries, AreComparedByTheToolsOwnCodeWhereNobodyAsksAnInstaller) {
 }
 
 // The simulator has just extracted the library from the package, so nobody changed it after that.
-TEST(Entries, LibraryChangedInsideThePackageIsNotBlamedOnTheInstallation) {
+TEST(PackageEntries, LibraryChangedInsideThePackageIsNotBlamedOnTheInstallation) {
   const json event = VerdictOf("changed-inside", {"--installer=off", "--install"});
   EXPECT_EQ(event["verdict"], "partly-signed");
   EXPECT_EQ(event["items"][1]["reason"], "library-changed-inside");
@@ -110,7 +110,7 @@ TEST(Entries, LibraryChangedInsideThePackageIsNotBlamedOnTheInstallation) {
 
 // The verifier reports the wrong length as an error of the package, and does not give up. The
 // length of an entry is in its local header and in its central directory header.
-TEST(Installer, RefusesAnEntryThatIsLongerThanItSays) {
+TEST(Installer, RefusesAnEntryThatIsLongerThanItClaims) {
   const TempDir directory;
   const ProcessResult made = RunProcess({"bash", "-e", "-c", R"(cp -r "$0"/* .
 python3 -c '
@@ -133,7 +133,7 @@ open("base.apk", "wb").write(data)')",
 }
 
 // Phones of API 27 verify v2, and later phones verify v3.
-TEST(Installer, RefusesWhatWasChangedUnderANewerSignature) {
+TEST(Installer, RefusesAPackageChangedAfterItsV2Signature) {
   for (const char* name : {"commented", "changed-inside-v2"}) {
     EXPECT_EQ(
         Told(name),
@@ -156,14 +156,14 @@ TEST(Installer, SaysWhichPhonesRefuse) {
             Lines({"SIGNED", "phones of API 29 install it, verified by v1", "-> 0"}));
 }
 
-TEST(Installer, RefusesAPackageForNewerPhonesThanThoseAskedAbout) {
+TEST(Installer, RefusesAPackageThatNeedsNewerPhones) {
   EXPECT_EQ(
       Told("apksigner-sha256-2048", {"--api", "16-17"}),
       Lines({"NOT INSTALLABLE",
              "phones do not install it: the app needs API 18 or later (MIN_SDK_VERSION)", "-> 1"}));
 }
 
-TEST(Installer, AnotherSignerIsSaidInTheVerdict) {
+TEST(Installer, OtherSignerIsShownInTheVerdict) {
   // Newer versions of apksigner write v3.1 for a rotated key as well.
   const std::string takers = "phones of API 27 and later install it, verified by v2, v3";
   Lines rotated = Told("rotated-key");
@@ -180,7 +180,7 @@ TEST(Installer, AnotherSignerIsSaidInTheVerdict) {
 
 // If the verifier is asked about all levels at once, it names one signer for all of them: the
 // signer with the first key.
-TEST(Installer, SignerForLaterPhonesAloneIsFound) {
+TEST(Installer, SignerOnlyForLaterPhonesIsFound) {
   const Lines told = Told("later-v3");
   EXPECT_EQ(told.front(), "NOT INSTALLABLE");
   // Versions of apksig give different reasons.
@@ -206,7 +206,7 @@ TEST(Installer, RefusesAV3SignerWithoutALineageFromTheV2Signer) {
 }
 
 // Older versions of apksig do not know v3.1, and would name the first key for all phones.
-TEST(Installer, SignerOfASchemeThatTheVerifierDoesNotKnowIsNotPassedOver) {
+TEST(Installer, SignerOfSchemeV31IsNotSkipped) {
   const ProcessResult run = RunProcess(
       {SimulatorPath(), "--quiet", "--installer=required", Golden("later-v31") + "/base.apk"});
   EXPECT_NE(run.output, "");
@@ -214,7 +214,7 @@ TEST(Installer, SignerOfASchemeThatTheVerifierDoesNotKnowIsNotPassedOver) {
   EXPECT_EQ(Told("later-v31", {"--api", "27-32"}).front(), "SIGNED");
 }
 
-TEST(Installer, RefusalOfTheOldestPhonesIsNotHiddenByV3) {
+TEST(Installer, RefusalByTheOldestPhonesIsReportedDespiteV3) {
   EXPECT_EQ(
       Told("without-v2"),
       Lines({"NOT INSTALLABLE",
@@ -223,7 +223,7 @@ TEST(Installer, RefusalOfTheOldestPhonesIsNotHiddenByV3) {
              "-> 1"}));
 }
 
-TEST(Installer, RefusalOfTheToolStays) {
+TEST(Installer, RefusalByTheToolStaysEvenIfPhonesInstall) {
   EXPECT_EQ(
       Told("apksigner-ec"),
       Lines({"REFUSED", "phones of API 27 and later install it, verified by v2, v3", "-> 1"}));

@@ -78,7 +78,7 @@ std::string RegisteredJar(const std::string& path) {
                    Log(4, "ZuAddCertificate: ZuNewCertificate return 0.\n")});
 }
 
-TEST(Jar, TrustedIsSignedWithAnEmptyPayload) {
+TEST(Jar, TrustedJarIsSignedWithAnEmptyPayload) {
   const TempDir directory;
   const std::string jar = directory / "framework.jar";
   WriteJar(jar);
@@ -95,7 +95,7 @@ TEST(Jar, TrustedIsSignedWithAnEmptyPayload) {
   EXPECT_EQ(run.status, 0);
 }
 
-TEST(Jar, NotTrustedIsNotSigned) {
+TEST(Jar, UntrustedJarIsNotSigned) {
   const TempDir directory;
   const std::string jar = directory / "framework.jar";
   WriteJar(jar);
@@ -106,7 +106,7 @@ TEST(Jar, NotTrustedIsNotSigned) {
   EXPECT_EQ(run.status, 1);
 }
 
-TEST(Jar, TheKernelsReasonIsLogged) {
+TEST(Jar, KernelsReasonIsLogged) {
   const TempDir directory;
   const std::string jar = directory / "framework.jar";
   WriteJar(jar);
@@ -117,7 +117,7 @@ TEST(Jar, TheKernelsReasonIsLogged) {
   EXPECT_EQ(run.status, 1);
 }
 
-TEST(Jar, TrustedWithTheAttributeIsSignedAndRegisteredUnderItsPath) {
+TEST(Jar, TrustedJarWithAttributeIsSignedAndRegisteredUnderItsPath) {
   const TempDir directory(PlaceForAttributes());
   const std::string jar = directory / "framework.jar";
   WriteJar(jar);
@@ -129,7 +129,7 @@ TEST(Jar, TrustedWithTheAttributeIsSignedAndRegisteredUnderItsPath) {
   EXPECT_EQ(run.status, 0);
 }
 
-TEST(Jar, NotTrustedWithTheAttributeIsRegisteredAllTheSame) {
+TEST(Jar, UntrustedJarWithAttributeIsStillRegistered) {
   const TempDir directory(PlaceForAttributes());
   const std::string jar = directory / "framework.jar";
   WriteJar(jar);
@@ -141,7 +141,7 @@ TEST(Jar, NotTrustedWithTheAttributeIsRegisteredAllTheSame) {
   EXPECT_EQ(run.status, 1);
 }
 
-TEST(Jar, WithAnEmptyAttributeIsNotRegistered) {
+TEST(Jar, JarWithAnEmptyAttributeIsNotRegistered) {
   const TempDir directory(PlaceForAttributes());
   const std::string jar = directory / "framework.jar";
   WriteJar(jar);
@@ -184,7 +184,7 @@ TEST(Jar, RefusedSignatureIsLogged) {
   EXPECT_EQ(run.status, 1);
 }
 
-TEST(Jar, TamperedSignatureDoesNotMatterToOneThatIsTrusted) {
+TEST(Jar, TrustedJarWithATamperedManifestIsSigned) {
   const TempDir directory;
   const std::string jar = directory / "framework.jar";
   PackageOptions options;
@@ -208,7 +208,7 @@ std::string NotAnArchive(const std::string& path, const std::string& reason) {
                    Log(6, "Zip archive is not valid for fd=3\n"), Exit(0)});
 }
 
-TEST(OtherFile, ThatIsNoArchiveIsRefusedByEachStep) {
+TEST(FileThatIsNotAnArchive, TextFileIsRefusedByBothSigningSteps) {
   const TempDir directory;
   const std::string file = directory.Write("notes.txt", Bytes(1000, 'x'));
 
@@ -218,7 +218,7 @@ TEST(OtherFile, ThatIsNoArchiveIsRefusedByEachStep) {
   EXPECT_EQ(run.status, 1);
 }
 
-TEST(OtherFile, ThatIsEmptyIsRefusedByEachStep) {
+TEST(FileThatIsNotAnArchive, EmptyFileIsRefusedByBothSigningSteps) {
   const TempDir directory;
   const std::string file = directory.Write("empty.apk", {});
 
@@ -229,7 +229,7 @@ TEST(OtherFile, ThatIsEmptyIsRefusedByEachStep) {
 }
 
 // The end-of-central-directory record alone.
-TEST(OtherFile, ThatIsAnArchiveWithoutEntriesIsRefusedByEachStep) {
+TEST(FileThatIsNotAnArchive, EmptyArchiveIsRefusedByBothSigningSteps) {
   const TempDir directory;
   const std::string file = directory.Write("empty.zip", BuildZip({}));
 
@@ -239,7 +239,7 @@ TEST(OtherFile, ThatIsAnArchiveWithoutEntriesIsRefusedByEachStep) {
   EXPECT_EQ(run.status, 1);
 }
 
-TEST(OtherFile, WithTheAttributeButNoArchiveIsNotRegistered) {
+TEST(FileThatIsNotAnArchive, TextFileWithTheAttributeIsNotRegistered) {
   const TempDir directory(PlaceForAttributes());
   const std::string file = directory.Write("notes.txt", Bytes(1000, 'x'));
   SetAttribute(file, "1");
@@ -260,7 +260,7 @@ std::string ZipRefusal(const std::string& path) {
 }
 
 // No version of the zip library opens a directory, but the versions return different codes.
-TEST(OtherFile, ThatIsADirectoryIsRefusedByEachStep) {
+TEST(FileThatIsNotAnArchive, DirectoryIsRefusedByBothSigningSteps) {
   const TempDir directory;
   const std::string refusal = ZipRefusal(directory.path());
   ASSERT_EQ(refusal[0], '-');

@@ -8,7 +8,7 @@ namespace {
 constexpr char kLaidOut[] =
     "  its libraries were laid out beside it, as an installer does; --install=no turns this off";
 
-TEST_F(Reason, TamperedLibrary) {
+TEST_F(Reason, TamperedLibraryIsReported) {
   Take("apksigner-sha256-2048");
   Do("echo >>lib/arm64/libvault.so");
   EXPECT_EQ(Told(7),
@@ -20,7 +20,7 @@ TEST_F(Reason, TamperedLibrary) {
                    "  ✓ key                    registered for com.example.vault", "-> 1"}));
 }
 
-TEST_F(Reason, EncryptedLibraryIsNotLaidOut) {
+TEST_F(Reason, EncryptedLibraryIsReported) {
   Take("apksigner-sha256-2048");
   Do("rm -r lib; unzip -q base.apk 'lib/*'; zip -q -P word base.apk lib/arm64-v8a/*; rm -r lib");
   EXPECT_EQ(Told(4, {"--install"}),
@@ -30,7 +30,7 @@ TEST_F(Reason, EncryptedLibraryIsNotLaidOut) {
                    "      Build the package again without a password.", "-> 1"}));
 }
 
-TEST_F(Reason, LibraryInASubdirectoryOfItsAbi) {
+TEST_F(Reason, LibraryInASubdirectoryOfItsAbiIsReported) {
   MakePackage(WithLibraries({{"lib/arm64-v8a/sub/libx.so", ToBytes("x")}}))
       .WriteTo(directory_ / "base.apk");
   EXPECT_EQ(Told(5)[2],
@@ -58,7 +58,7 @@ TEST_F(Reason, LibrariesOfAnotherProcessorAreNotLaidOut) {
 }
 
 // With --strict, a library that no installer puts beside the package counts as refused.
-TEST_F(Reason, StrictRefusesALibraryThatNoInstallerTakes) {
+TEST_F(Reason, StrictRefusesALibraryThatNoInstallerExtracts) {
   MakePackage(WithLibraries({{"lib/arm64-v8a/libx.so", ToBytes("x")},
                              {"lib/arm64-v8a/sub/liby.so", ToBytes("y")}}))
       .WriteTo(directory_ / "base.apk");
@@ -67,7 +67,7 @@ TEST_F(Reason, StrictRefusesALibraryThatNoInstallerTakes) {
 }
 
 // The package without libraries beside it, as a store delivers it.
-TEST_F(Reason, LibrariesThatAreNotBesideThePackage) {
+TEST_F(Reason, LibrariesMissingBesideThePackageAreReported) {
   Take("apksigner-sha256-2048");
   Do("rm -r lib");
   const std::string absent =
@@ -114,7 +114,7 @@ TEST_F(Reason, PackageWithoutLibrariesBesideItIsLaidOut) {
   EXPECT_EQ(run().output, alone.output);
 }
 
-TEST_F(Reason, LibraryOfOneProcessorThatWasNotInstalled) {
+TEST_F(Reason, MissingLibraryOfOneProcessorIsReported) {
   Take("apksigner-sha256-2048");
   Do("rm -r lib/arm");
   EXPECT_EQ(Told(4)[2], "  ✓ lib/arm64/libvault.so  signed");
@@ -123,7 +123,7 @@ TEST_F(Reason, LibraryOfOneProcessorThatWasNotInstalled) {
             "the package");
 }
 
-TEST_F(Reason, LibrariesThatThePackageKeeps) {
+TEST_F(Reason, LibrariesKeptInsideThePackageAreReported) {
   Take("kept-libraries");
   Do("rm -r lib");
   const std::string kept =

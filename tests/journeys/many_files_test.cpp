@@ -82,7 +82,7 @@ TEST_F(ManyFiles, DirectoryWithoutRecursiveIsRefusedWithTheCure) {
 }
 
 // The tool looked at no file in the empty directory, so the run must fail.
-TEST_F(ManyFiles, DirectoryWithoutPackagesIsNoSuccess) {
+TEST_F(ManyFiles, DirectoryWithoutPackagesGivesStatus4) {
   fs::create_directory(directory_ / "empty");
   ASSERT_EQ(Told(Do("sim --recursive good empty --journal journal")),
             Lines({"SIGNED  good/base.apk", "NOT LOOKED AT  empty", "-> 4"}));
@@ -94,7 +94,7 @@ TEST_F(ManyFiles, DirectoryWithoutPackagesIsNoSuccess) {
   EXPECT_EQ(verdict["items"][0]["reason"], "no-packages");
 }
 
-TEST_F(ManyFiles, DirectoryThatMayNotBeReadIsNoSuccess) {
+TEST_F(ManyFiles, UnreadableDirectoryGivesStatus4) {
   if (!CanMakeNamespaces()) GTEST_SKIP() << kNoNamespaces;
   fs::create_directory(directory_ / "good/locked");
   fs::permissions(directory_ / "good/locked", fs::perms::none);
@@ -113,7 +113,7 @@ TEST_F(ManyFiles, NamesComeFromAList) {
       Lines({"REFUSED  shop/unsigned.apk", "NOT LOOKED AT  good\\x0ashop", "-> 4"}));
 }
 
-TEST_F(ManyFiles, ListThatNamesNothingIsNoSuccess) {
+TEST_F(ManyFiles, EmptyOrMissingListGivesStatus2) {
   EXPECT_EQ(Told(Do("sim good/base.apk --files-from - </dev/null")),
             Lines({"-> 2", "apktoolkit-sim: the list on standard input contains no file names\n"}));
   EXPECT_EQ(Told(Do("sim --files-from none")),
@@ -124,7 +124,7 @@ TEST_F(ManyFiles, ListThatNamesNothingIsNoSuccess) {
 
 // Each run extracts the package's libraries into a new temporary directory. No output contains the
 // name of this directory, so only the process ID and the date of the run differ.
-TEST_F(ManyFiles, TwoRunsOverTheSameFileTellTheSame) {
+TEST_F(ManyFiles, TwoRunsOverOneFileGiveTheSameOutput) {
   const std::string both =
       "for run in 1 2; do sim --journal $run.journal --html $run.html good/base.apk; "
       "\"$SIM\" --installer=off --verbose good/base.apk >$run.text; "
@@ -149,7 +149,7 @@ TEST_F(ManyFiles, TwoRunsOverTheSameFileTellTheSame) {
 
 // A file name that contains the placeholder <install> is shown unchanged. The placeholder is not
 // ambiguous, because a resolved path begins with a slash.
-TEST_F(ManyFiles, NameThatLooksLikeAnInstallationIsTold) {
+TEST_F(ManyFiles, NameThatLooksLikeThePlaceholderIsShownUnchanged) {
   const ProcessResult run =
       Do("mkdir '<install>'; cp good/base.apk '<install>'/; sim --journal journal "
          "'<install>'/base.apk");

@@ -47,7 +47,7 @@ std::string BothRefused(const std::string& library_part, const std::string& pack
                    Log(4, "VeltSign finished: 65536.\n")});
 }
 
-TEST_F(GoodPackageOn, APhoneWhoseIntegrityValueSettlesIsSignedThen) {
+TEST_F(GoodPackageOn, PhoneSignsOnceItsIntegrityValueSettles) {
   const Simulation run = Simulate(apk_, {"--integrity", "ffffffff,ffffffff,1f"});
 
   EXPECT_EQ(run.timeline,
@@ -58,7 +58,7 @@ TEST_F(GoodPackageOn, APhoneWhoseIntegrityValueSettlesIsSignedThen) {
   EXPECT_EQ(run.status, 0);
 }
 
-TEST_F(GoodPackageOn, APhoneThatRevokesItsIntegrityAfterTheLibraryIsNotSignedItself) {
+TEST_F(GoodPackageOn, PhoneThatLosesItsIntegritySignsOnlyTheLibrary) {
   const Simulation run = Simulate(apk_, {"--integrity", "1f,missing"});
 
   EXPECT_EQ(run.timeline, Timeline({LibraryStep({SignedLibrary(library_)}),
@@ -68,7 +68,7 @@ TEST_F(GoodPackageOn, APhoneThatRevokesItsIntegrityAfterTheLibraryIsNotSignedIts
   EXPECT_EQ(run.status, 1);
 }
 
-TEST_F(GoodPackageOn, APhoneWithoutIntegrityFilesIsNotSigned) {
+TEST_F(GoodPackageOn, PhoneWithoutIntegrityFilesSignsNothing) {
   const Simulation run = Simulate(apk_, {"--integrity", "missing"});
 
   EXPECT_EQ(run.timeline, Timeline({BothRefused(IntegrityMissing(), IntegrityMissing(), ENOENT),
@@ -85,7 +85,7 @@ std::string WithoutErrno(const std::string& timeline) {
 class PhoneThatMayNotSign : public GoodPackageOn,
                             public testing::WithParamInterface<const char*> {};
 
-TEST_P(PhoneThatMayNotSign, IsNotAskedTo) {
+TEST_P(PhoneThatMayNotSign, IsNotAskedToSign) {
   const Simulation run = Simulate(apk_, {"--integrity", GetParam()});
 
   EXPECT_EQ(WithoutErrno(run.timeline),
@@ -96,7 +96,7 @@ TEST_P(PhoneThatMayNotSign, IsNotAskedTo) {
 
 INSTANTIATE_TEST_SUITE_P(IntegrityValues, PhoneThatMayNotSign, testing::Values("0", "none", ""));
 
-TEST_F(GoodPackageOn, APhoneWhoseKernelRefusesIsNotSignedButRegistered) {
+TEST_F(GoodPackageOn, PhoneWhoseKernelRefusesStillRegistersTheKey) {
   const Simulation run = Simulate(apk_, {"--sign-errno", "EACCES"});
 
   EXPECT_EQ(
@@ -107,7 +107,7 @@ TEST_F(GoodPackageOn, APhoneWhoseKernelRefusesIsNotSignedButRegistered) {
   EXPECT_EQ(run.status, 1);
 }
 
-TEST_F(GoodPackageOn, APhoneThatTrustsNoFileIsSignedAllTheSame) {
+TEST_F(GoodPackageOn, PhoneThatTrustsNoFileStillSignsThePackage) {
   const Simulation run = Simulate(apk_, {"--verify-errno", "EPERM"});
 
   EXPECT_EQ(run.timeline, Timeline({LibraryStep({SignedLibrary(library_)}), PackageStep(apk_),

@@ -13,7 +13,7 @@
 
 namespace {
 
-TEST_F(Reason, Unsigned) {
+TEST_F(Reason, UnsignedPackageIsReported) {
   Take("unsigned.apk");
   EXPECT_EQ(Told(3), Lines({"REFUSED  base.apk",
                             "  ✗ package                not signed: it is unsigned: "
@@ -21,7 +21,7 @@ TEST_F(Reason, Unsigned) {
                             "      Sign it: apksigner sign --v1-signing-enabled true.", "-> 1"}));
 }
 
-TEST_F(Reason, NewerSchemeOnly) {
+TEST_F(Reason, PackageSignedOnlyWithNewerSchemesIsReported) {
   Take("apksigner-newer-only");
   EXPECT_EQ(
       Told(4),
@@ -32,7 +32,7 @@ TEST_F(Reason, NewerSchemeOnly) {
              "      apksigner sign --v1-signing-enabled true --min-sdk-version 23.", "-> 1"}));
 }
 
-TEST_F(Reason, SignedByJarsigner) {
+TEST_F(Reason, JarsignerSignatureIsReported) {
   for (const char* name : {"jarsigner-sha256", "jarsigner-sha1"}) {
     const std::string directory = std::string(GOLDEN_PACKAGES) + "/" + name;
     const Lines told = WithoutReason(3, FirstLines(kAll, {"base.apk"}, {{}, directory}));
@@ -43,7 +43,7 @@ TEST_F(Reason, SignedByJarsigner) {
   }
 }
 
-TEST_F(Reason, CertificateThatAnAuthorityIssued) {
+TEST_F(Reason, CertificateOfAnotherIssuerIsReported) {
   Take("openssl-cms-issued");
   EXPECT_EQ(
       Told(4),
@@ -55,7 +55,7 @@ TEST_F(Reason, CertificateThatAnAuthorityIssued) {
              "      -sigalg SHA256withRSA. This makes another signer: phones refuse the", "-> 1"}));
 }
 
-TEST_F(Reason, EcKey) {
+TEST_F(Reason, EcKeyIsReported) {
   Take("apksigner-ec");
   EXPECT_EQ(Told(3),
             Lines({"REFUSED  base.apk",
@@ -65,7 +65,7 @@ TEST_F(Reason, EcKey) {
                    "-> 1"}));
 }
 
-TEST_F(Reason, KeyOfMoreThan4096Bits) {
+TEST_F(Reason, KeyOfMoreThan4096BitsIsReported) {
   Take("apksigner-5120");
   EXPECT_EQ(Told(3),
             Lines({"REFUSED  base.apk",
@@ -75,7 +75,7 @@ TEST_F(Reason, KeyOfMoreThan4096Bits) {
                    "-> 1"}));
 }
 
-TEST_F(Reason, DsaKey) {
+TEST_F(Reason, DsaKeyIsReported) {
   Do("LC_ALL=C.UTF-8 keytool -genkeypair -keyalg DSA -keysize 2048 -sigalg SHA256withDSA "
      "-validity 10000 -alias cert -dname CN=Own -keystore key.p12 -storepass android "
      "2>keytool.log;"
@@ -92,7 +92,7 @@ TEST_F(Reason, DsaKey) {
 }
 
 // The text of the cure also states its disadvantage: the package gets another signer.
-TEST_F(Reason, AnotherKeyIsAnotherSignerAndRotationDoesNotHelp) {
+TEST_F(Reason, CureByAnotherKeyStatesItsDisadvantage) {
   for (const char* name : {"apksigner-ec", "apksigner-5120"}) {
     Do("rm -rf -- *");
     Take(name);
@@ -108,7 +108,7 @@ TEST_F(Reason, AnotherKeyIsAnotherSignerAndRotationDoesNotHelp) {
 
 // By default, every version of keytool signs the certificate of an RSA key of 3584 bits with
 // SHA-384. The package keytool-sha256 shows that the cure helps.
-TEST_F(Reason, CertificateSignedWithALongerDigest) {
+TEST_F(Reason, CertificateSignedWithSha384IsReported) {
   Take("keytool-sha384");
   const Lines told = Told(5);
   EXPECT_EQ(Lines(told.begin() + 1, told.end()),
@@ -122,7 +122,7 @@ TEST_F(Reason, CertificateSignedWithALongerDigest) {
             Lines({"-> 0"}));
 }
 
-TEST_F(Reason, SignatureOverALongerDigest) {
+TEST_F(Reason, SignatureOverSha512IsReported) {
   Take("openssl-cms-sha512");
   EXPECT_EQ(Told(2)[1],
             "  ✗ package                not signed: it is signed over SHA512, and this tool reads "
@@ -131,7 +131,7 @@ TEST_F(Reason, SignatureOverALongerDigest) {
 
 // No tool makes a signature block whose key has the public exponent 1. The test writes such a block
 // for another owner's key, without the private key.
-TEST_F(Reason, ExponentOfOne) {
+TEST_F(Reason, ExponentOf1OrMinus1IsReported) {
   Take("apksigner-sha256-2048");
   Do("unzip -q base.apk META-INF/CERT.SF");
   const Bytes signature_file = ToBytes(ContentOf(directory_ / "META-INF/CERT.SF"));
@@ -150,19 +150,19 @@ TEST_F(Reason, ExponentOfOne) {
             "with which anyone can make its signatures");
 }
 
-TEST_F(Reason, Directory) {
+TEST_F(Reason, DirectoryIsReported) {
   EXPECT_EQ(Told(3, {}, "."),
             Lines({"REFUSED  .", "  ✗ file  not signed: it is a directory",
                    "      Name the package inside it, or give --recursive.", "-> 1"}));
 }
 
-TEST_F(Reason, EmptyFile) {
+TEST_F(Reason, EmptyFileIsReported) {
   directory_.Write("base.apk", {});
   EXPECT_EQ(Told(2), Lines({"REFUSED  base.apk",
                             "  ✗ file  not signed: it is empty, a file of 0 bytes", "-> 1"}));
 }
 
-TEST_F(Reason, CutFile) {
+TEST_F(Reason, TruncatedFileIsReported) {
   Take("apksigner-sha256-2048");
   Do("truncate -s 5000 base.apk");
   EXPECT_EQ(Told(2), Lines({"REFUSED  base.apk",
@@ -174,13 +174,13 @@ TEST_F(Reason, CutFile) {
                             (directory_ / "base.apk") + " is not zip");
 }
 
-TEST_F(Reason, TextFile) {
+TEST_F(Reason, TextFileIsReported) {
   directory_.Write("base.apk", ToBytes("<html>404 Not Found</html>\n"));
   EXPECT_EQ(Told(2), Lines({"REFUSED  base.apk",
                             "  ✗ file  not signed: it is a text and not an archive", "-> 1"}));
 }
 
-TEST_F(Reason, DamagedArchive) {
+TEST_F(Reason, DamagedArchiveIsReported) {
   Take("apksigner-sha256-2048");
   // This changes the central directory's offset in the end-of-central-directory record.
   Do("printf '\\xff' | dd of=base.apk bs=1 conv=notrunc status=none "
@@ -189,7 +189,7 @@ TEST_F(Reason, DamagedArchive) {
             "  ✗ file  not signed: it is a damaged archive, which the zip library does not open");
 }
 
-TEST_F(Reason, IntegrityValueZero) {
+TEST_F(Reason, IntegrityValueOf0IsReported) {
   Take("apksigner-sha256-2048");
   EXPECT_EQ(
       Told(8, {"--integrity", "0"}),
@@ -205,19 +205,19 @@ TEST_F(Reason, IntegrityValueZero) {
              "  ✓ key                    registered for com.example.vault", "  signer", "-> 1"}));
 }
 
-TEST_F(Reason, KernelThatRefuses) {
+TEST_F(Reason, RefusalByTheKernelIsReported) {
   Take("apksigner-sha256-2048");
   EXPECT_EQ(Told(2, {"--sign-errno", "EPERM"})[1],
             "  ✗ package                not signed: the kernel refused (EPERM: Operation not "
             "permitted)");
 }
 
-TEST_F(Reason, MissingFile) {
+TEST_F(Reason, MissingFileIsReported) {
   EXPECT_EQ(Told(2), Lines({"NOT LOOKED AT  base.apk",
                             "  ✗ file  not looked at: there is no such file", "-> 4"}));
 }
 
-TEST_F(Reason, NoPermission) {
+TEST_F(Reason, MissingReadPermissionIsReported) {
   if (!CanMakeNamespaces()) GTEST_SKIP() << kNoNamespaces;
   Take("apksigner-sha256-2048");
   std::filesystem::permissions(directory_ / "base.apk", std::filesystem::perms::none);
@@ -226,7 +226,7 @@ TEST_F(Reason, NoPermission) {
                    "  ✗ file  not looked at: there is no permission to read it", "-> 4"}));
 }
 
-TEST_F(Reason, ReadOnlyFileSystem) {
+TEST_F(Reason, ReadOnlyFileSystemIsReported) {
   if (!CanMakeNamespaces()) GTEST_SKIP() << kNoNamespaces;
   Take("apksigner-sha256-2048");
   const TempDir mount_point;
@@ -239,7 +239,7 @@ TEST_F(Reason, ReadOnlyFileSystem) {
                    "-> 4"}));
 }
 
-TEST_F(Reason, ClosedStandardInput) {
+TEST_F(Reason, ClosedStandardInputIsReported) {
   Take("apksigner-sha256-2048");
   EXPECT_EQ(Told(2, {}, "base.apk", {"bash", "-c", "exec \"$0\" \"$@\" <&-"}),
             Lines({"NOT LOOKED AT  base.apk",
@@ -248,7 +248,7 @@ TEST_F(Reason, ClosedStandardInput) {
                    "-> 4"}));
 }
 
-TEST_F(Reason, TamperedDexFile) {
+TEST_F(Reason, TamperedDexFileIsReported) {
   Take("changed-dex");
   EXPECT_EQ(Told(7),
             Lines({"REFUSED  base.apk",
@@ -261,7 +261,7 @@ TEST_F(Reason, TamperedDexFile) {
                    "  ✗ key                    not registered: the package is refused", "-> 1"}));
 }
 
-TEST_F(Reason, TamperedManifest) {
+TEST_F(Reason, TamperedManifestIsReported) {
   Take("apksigner-sha256-2048");
   Do("unzip -q base.apk META-INF/MANIFEST.MF; echo >>META-INF/MANIFEST.MF;"
      " zip -q base.apk META-INF/MANIFEST.MF");
@@ -272,7 +272,7 @@ TEST_F(Reason, TamperedManifest) {
                    "      Sign the package again, as the last step that changes it.", "-> 1"}));
 }
 
-TEST_F(Reason, TamperedSignatureFile) {
+TEST_F(Reason, TamperedSignatureFileIsReported) {
   Take("apksigner-sha256-2048");
   Do("unzip -q base.apk META-INF/CERT.SF; echo >>META-INF/CERT.SF;"
      " zip -q base.apk META-INF/CERT.SF");
@@ -282,7 +282,7 @@ TEST_F(Reason, TamperedSignatureFile) {
       "after it was signed");
 }
 
-TEST_F(Reason, SignatureThatWasTakenOut) {
+TEST_F(Reason, RemovedSignatureIsReported) {
   Take("apksigner-sha256-2048");
   Do("zip -q -d base.apk META-INF/CERT.RSA");
   EXPECT_EQ(Told(2)[1],
@@ -294,7 +294,7 @@ TEST_F(Reason, SignatureThatWasTakenOut) {
             "META-INF/*.SF, in capitals");
 }
 
-TEST_F(Reason, EntryThatStandsTwice) {
+TEST_F(Reason, DuplicateEntryIsReported) {
   Take("apksigner-sha256-2048");
   Do("python3 -W ignore -c \"import zipfile; zipfile.ZipFile('base.apk', 'a').writestr("
      "'classes.dex', 'x')\"");
@@ -303,7 +303,7 @@ TEST_F(Reason, EntryThatStandsTwice) {
             "does not open such an archive");
 }
 
-TEST_F(Reason, EncryptedEntry) {
+TEST_F(Reason, EncryptedEntryGivesAWarning) {
   Take("apksigner-sha256-2048");
   Do("echo x >secret; zip -q -P word base.apk secret");
   const Lines told = Told(kAll);
@@ -312,7 +312,7 @@ TEST_F(Reason, EncryptedEntry) {
             told.end());
 }
 
-TEST_F(Reason, EncryptedEntryThatTheToolReads) {
+TEST_F(Reason, EncryptedEntryThatTheToolReadsIsReported) {
   for (const std::string entry : {"AndroidManifest.xml", "META-INF/MANIFEST.MF", "META-INF/CERT.SF",
                                   "META-INF/CERT.RSA", "classes.dex"}) {
     Do("rm -rf -- *");
@@ -323,7 +323,7 @@ TEST_F(Reason, EncryptedEntryThatTheToolReads) {
   }
 }
 
-TEST_F(Reason, ArchivesThatAreNoPackage) {
+TEST_F(Reason, ArchivesThatAreNotPackagesAreReported) {
   Take("apksigner-sha256-2048");
   Do("touch BundleConfig.pb; zip -q app.aab BundleConfig.pb; zip -q set.apks base.apk;"
      "echo '{}' >manifest.json; zip -q set.xapk manifest.json base.apk;"
@@ -347,7 +347,7 @@ TEST_F(Reason, ArchivesThatAreNoPackage) {
   EXPECT_EQ(Told(2)[1].substr(0, 50), "  ✗ JAR  not signed: it has parts of a package (");
 }
 
-TEST_F(Reason, KeyOf512BitsIsSignedWithAWarning) {
+TEST_F(Reason, PackageWithAKeyOf512BitsIsSignedWithAWarning) {
   PackageOptions options;
   options.block.key = "rsa-512";
   MakePackage(options).WriteTo(directory_ / "base.apk");
@@ -361,7 +361,7 @@ TEST_F(Reason, KeyOf512BitsIsSignedWithAWarning) {
 }
 
 // The command in the cure makes another certificate for the same key, and the tool accepts it.
-TEST_F(Reason, CertificateWithSha384IsCuredByTheCommandThatIsTold) {
+TEST_F(Reason, CertificateWithSha384IsCuredByTheShownCommand) {
   Take("keytool-sha384");
   const Lines told = Told(10);
   std::string cure;
@@ -384,7 +384,7 @@ TEST_F(Reason, CertificateWithSha384IsCuredByTheCommandThatIsTold) {
   EXPECT_NE(ContentOf(directory_ / "listed").find("SHA256withRSA"), std::string::npos);
 }
 
-TEST_F(Reason, Jar) {
+TEST_F(Reason, PlainJarIsSignedOnlyIfTrusted) {
   Do("echo text >a.txt; jar --create --file library.jar a.txt");
   EXPECT_EQ(Told(2, {}, "library.jar"),
             Lines({"NOT TRUSTED JAR  library.jar",

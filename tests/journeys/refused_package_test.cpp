@@ -87,7 +87,7 @@ class RefusedPackage : public testing::Test {
 
 using TamperedPackage = RefusedPackage;
 
-TEST_F(TamperedPackage, LibraryOnDiskIsNotSigned) {
+TEST_F(TamperedPackage, ChangedLibraryOnDiskIsNotSigned) {
   Bytes changed = kLibrary;
   changed.back() ^= 1;
   WriteFile(library_, changed);
@@ -187,27 +187,27 @@ TEST_F(TamperedPackage, CertificateOfAnotherIssuerIsRefused) {
 
 using IncompletePackage = RefusedPackage;
 
-TEST_F(IncompletePackage, WithoutItsManifestIsRefusedSilently) {
+TEST_F(IncompletePackage, IsRefusedWithoutALoggedReasonIfManifestIsMissing) {
   package_.Remove("META-INF/MANIFEST.MF");
   ExpectRefusalAfter({});
 }
 
-TEST_F(IncompletePackage, WithoutItsSignatureFileIsRefusedSilently) {
+TEST_F(IncompletePackage, IsRefusedWithoutALoggedReasonIfSignatureFileIsMissing) {
   package_.Remove("META-INF/CERT.SF");
   ExpectRefusalAfter({});
 }
 
-TEST_F(IncompletePackage, WithASignatureFileInLowerCaseIsRefusedSilently) {
+TEST_F(IncompletePackage, IsRefusedWithoutALoggedReasonIfSignatureFileIsLowerCase) {
   package_.Item("META-INF/CERT.SF").name = "META-INF/cert.sf";
   ExpectRefusalAfter({});
 }
 
-TEST_F(IncompletePackage, WithoutItsSignatureBlockIsRefused) {
+TEST_F(IncompletePackage, IsRefusedIfTheSignatureBlockIsMissing) {
   package_.Remove("META-INF/CERT.RSA");
   ExpectRefusalAfter({Log(6, "Can't extract RSA certificate: META-INF/CERT.RSA\n")});
 }
 
-TEST_F(IncompletePackage, WithoutItsDexFileIsGood) {
+TEST_F(IncompletePackage, IsSignedEvenWithoutItsDexFile) {
   package_.Remove("classes.dex");
   ExpectAllSigned();
 }
@@ -250,7 +250,7 @@ TEST_F(IncompletePackage, LibraryThatMayNotBeReadIsRefused) {
   EXPECT_EQ(run.status, 1);
 }
 
-TEST_F(IncompletePackage, WithoutADigestOfTheLibraryTheLibraryIsRefused) {
+TEST_F(IncompletePackage, LibraryWithoutADigestIsRefused) {
   package_ = MakePackage([] {
     PackageOptions options = Options();
     options.entries = {{"classes.dex", ToBytes("dex\n035")}};
@@ -263,7 +263,7 @@ TEST_F(IncompletePackage, WithoutADigestOfTheLibraryTheLibraryIsRefused) {
        Log(6, "VeltSignJni: File not verified: " + library_ + "\n")});
 }
 
-TEST_F(IncompletePackage, OneRefusedLibraryDoesNotStopTheOther) {
+TEST_F(IncompletePackage, MissingLibraryDoesNotStopTheOther) {
   package_ = MakePackage([] {
     PackageOptions options;
     options.entries = {{"lib/arm64-v8a/libfoo.so", kLibrary}, {"lib/armeabi/libbar.so", kLibrary}};

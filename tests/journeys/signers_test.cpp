@@ -96,11 +96,11 @@ TEST(KernelsDigest, IsThatOfTheModulusAlone) {
       "    modulus SHA-256 digest: " + modulus.output.substr(0, 64) + " (of the modulus alone)\n");
 }
 
-TEST(Doubtful, GoodPackageHasNothing) {
+TEST(SignerWarnings, GoodPackageHasNoWarning) {
   EXPECT_EQ(LineWith(Told("apksigner-sha256-2048"), "  ! "), "");
 }
 
-TEST(Doubtful, SeveralSigners) {
+TEST(SignerWarnings, SeveralSignersGiveAWarning) {
   const std::string told = Told("two-signers");
   EXPECT_EQ(LineWith(told, "SIGNED").substr(0, 6), "SIGNED");
   EXPECT_EQ(LineWith(told, "  ! "),
@@ -109,7 +109,7 @@ TEST(Doubtful, SeveralSigners) {
 
 // Newer phones use the package's new key, and this tool uses the old one. apksigner writes the new
 // key into the newest scheme that it knows: v3, or v3.1 from version 32 of apksigner on.
-TEST(Doubtful, KeyThatWasRotated) {
+TEST(SignerWarnings, RotatedKeyGivesAWarning) {
   const std::string told = Told("rotated-key");
   const std::string schemes = LineWith(told, "schemes: ");
   const std::string newest = schemes.find("v3.1") != std::string::npos ? "v3.1" : "v3";
@@ -119,7 +119,7 @@ TEST(Doubtful, KeyThatWasRotated) {
             std::string::npos);
 }
 
-TEST(Doubtful, EntryThatWasAddedAfterSigning) {
+TEST(SignerWarnings, EntryAddedAfterSigningGivesAWarning) {
   const std::string told = Told("added-entry", {"--verbose"});
   EXPECT_EQ(LineWith(told, "does not protect"),
             "  ! the signature does not protect 1 entry (6 bytes): no digest in the manifest");
@@ -127,7 +127,7 @@ TEST(Doubtful, EntryThatWasAddedAfterSigning) {
   EXPECT_EQ(LineWith(Told("added-entry"), "not listed: "), "");
 }
 
-TEST(Doubtful, SchemesThatWereStripped) {
+TEST(SignerWarnings, StrippedSchemesGiveAWarning) {
   EXPECT_EQ(LineWith(Told("added-entry"), "as well"),
             "  ! the signature file says that the package is signed with v2, v3 as well, and it is "
             "not: phones do not install it");

@@ -175,7 +175,7 @@ void ExpectKey(const Told& told, const std::string& digest) {
 
 }  // namespace
 
-TEST(TwoFaces, ExponentThatWritesTheModulusLengthShowsNoVictimsKey) {
+TEST(PackageReadInTwoWays, VictimsKeyIsNotShownIfExponentSetsModulusLength) {
   std::string digest;
   const Told told(WithAPrimeBehindTheVictimsModulus(&digest));
   EXPECT_EQ(told.status, 0);
@@ -190,7 +190,7 @@ TEST(TwoFaces, ExponentThatWritesTheModulusLengthShowsNoVictimsKey) {
   }
 }
 
-TEST(TwoFaces, TwoZerosBeforeTheModulusMakeAnotherKey) {
+TEST(PackageReadInTwoWays, TwoZerosBeforeTheModulusMakeAnotherKey) {
   std::string digest;
   const Told told(WithAZeroBeforeTheModulus(&digest));
   EXPECT_EQ(told.status, 0);
@@ -201,7 +201,7 @@ TEST(TwoFaces, TwoZerosBeforeTheModulusMakeAnotherKey) {
 }
 
 // Other programs accept an exponent of five bytes, so they read the certificate.
-TEST(TwoFaces, CertificateThatOthersReadIsComparedWithTheKernelsKey) {
+TEST(PackageReadInTwoWays, CertificateWithA5ByteExponentShowsAnotherKey) {
   Certificate certificate;
   certificate.public_key_info =
       PublicKeyInfoAround(der::Sequence({der::Integer(Concat({{0}, ModulusOf("rsa-2048")})),
@@ -218,7 +218,7 @@ TEST(TwoFaces, CertificateThatOthersReadIsComparedWithTheKernelsKey) {
   EXPECT_FALSE(Has(told.head, "key " + Shortened(VictimsDigest())));
 }
 
-TEST(TwoFaces, BlockThatNoStrictReaderReadsIsAmbiguous) {
+TEST(PackageReadInTwoWays, WronglyTaggedCertificatesMakeTheBlockAmbiguous) {
   Package package = MakePackage();
   Bytes& block = package.Item("META-INF/CERT.RSA").data;
   const Bytes certificate = SignatureBlock().SignerCertificate().Build();
@@ -234,7 +234,7 @@ TEST(TwoFaces, BlockThatNoStrictReaderReadsIsAmbiguous) {
   EXPECT_EQ(told.Warnings(), Codes({"block-ambiguous"}));
 }
 
-TEST(TwoFaces, SignatureThatNamesAnotherCertificateIsAmbiguous) {
+TEST(PackageReadInTwoWays, SignatureThatNamesAnotherCertificateIsAmbiguous) {
   PackageOptions options;
   options.block.serial = der::Integer(99);
   const Told told(MakePackage(options));
@@ -243,7 +243,7 @@ TEST(TwoFaces, SignatureThatNamesAnotherCertificateIsAmbiguous) {
   EXPECT_TRUE(Has(told.head, "   ! other programs may find a different signer"));
 }
 
-TEST(TwoFaces, PackageNameOfAnotherNamespaceIsToldBesideTheInstallers) {
+TEST(PackageReadInTwoWays, OtherPackageNameForInstallersIsReported) {
   PackageOptions options;
   options.android_manifest =
       CompiledXml()
@@ -260,7 +260,7 @@ TEST(TwoFaces, PackageNameOfAnotherNamespaceIsToldBesideTheInstallers) {
 
 // ---- The newer signatures (v2 and later): only the values that the platform reads count.
 
-TEST(TwoFaces, SecondValueOfASchemeIsNobodys) {
+TEST(PackageReadInTwoWays, SecondValueOfASchemeIsIgnored) {
   const Bytes own = Signers({SignerBytes(SignatureBlock().SignerCertificate().Build())});
   Certificate certificate;
   certificate.key = "rsa-2048-other";
@@ -276,7 +276,7 @@ TEST(TwoFaces, SecondValueOfASchemeIsNobodys) {
   EXPECT_EQ(warnings({{kSchemeV2, both}}), Codes({"other-key"}));
 }
 
-TEST(TwoFaces, SigningBlockThatIsTooLargeIsTold) {
+TEST(PackageReadInTwoWays, SigningBlockThatIsTooLargeIsReported) {
   Certificate certificate;
   certificate.key = "rsa-2048-other";
   const Bytes block = SigningBlockBytes(
@@ -289,7 +289,7 @@ TEST(TwoFaces, SigningBlockThatIsTooLargeIsTold) {
 
 // ---- Damage hides nothing.
 
-TEST(TwoFaces, DamagedEntryHidesNoOther) {
+TEST(PackageReadInTwoWays, DamagedEntryHidesNoOther) {
   Package package = MakePackage();
   package.items.push_back({"res/damaged", ToBytes("x")});
   package.items.back().local.crc = 1;

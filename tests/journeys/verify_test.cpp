@@ -63,12 +63,12 @@ TEST_F(SignedPackage, IsTrustedWithItsLibrary) {
                apk_ + ": trusted\n" + library_ + ": trusted\n");
 }
 
-TEST_F(SignedPackage, IsTrustedAndWhatWasNotSignedIsNot) {
+TEST_F(SignedPackage, IsTrustedButAnUnsignedFileIsNot) {
   ExpectAnswer(Verify({"--state", state_, other_, apk_}), 1,
                other_ + ": not trusted (errno 126, ENOKEY)\n" + apk_ + ": trusted\n");
 }
 
-TEST_F(SignedPackage, IsNoLongerTrustedWhenAByteChanges) {
+TEST_F(SignedPackage, LibraryIsNotTrustedAfterAByteChanges) {
   directory_.Write("lib/arm64/libfoo.so", ToBytes("\177ELF fop"));
   ExpectAnswer(Verify({"--state", state_, apk_, library_}), 1,
                apk_ + ": trusted\n" + library_ + ": not trusted (errno 126, ENOKEY)\n");
@@ -90,7 +90,7 @@ TEST(Verify, KernelGivesTheReason) {
 
 // The kernel is asked once per file. The program does not read the integrity value, and signs
 // nothing.
-TEST(Verify, AsksForEachFileOnce) {
+TEST(Verify, AsksTheKernelOnceForAFile) {
   const TempDir directory;
   const std::string file = directory.Write("file", {});
   const ProcessResult run = Verify({"--json", "--trust", file, file});
@@ -103,7 +103,7 @@ TEST(Verify, AsksForEachFileOnce) {
   EXPECT_EQ(run.status, 0);
 }
 
-TEST(Verify, WhatCannotBeOpenedIsNotAsked) {
+TEST(Verify, MissingFileCannotBeOpened) {
   const TempDir directory;
   const std::string missing = directory / "missing";
   const std::string below = directory.Write("file", {}) + "/below";
@@ -112,7 +112,7 @@ TEST(Verify, WhatCannotBeOpenedIsNotAsked) {
                    ": cannot be opened (errno 20, ENOTDIR)\n");
 }
 
-TEST(Verify, WhatMayNotBeReadCannotBeOpened) {
+TEST(Verify, FileWithoutReadPermissionCannotBeOpened) {
   if (!CanMakeNamespaces()) GTEST_SKIP() << kNoNamespaces;
   const TempDir directory;
   const std::string file = directory.Write("file", {});
@@ -122,7 +122,7 @@ TEST(Verify, WhatMayNotBeReadCannotBeOpened) {
 }
 
 // A FIFO does not make the program wait. The kernel's answer counts only for a regular file.
-TEST(Verify, WhatIsNoRegularFileIsNotTrusted) {
+TEST(Verify, FileThatIsNotRegularIsNotTrusted) {
   const TempDir directory;
   const std::string fifo = directory / "fifo";
   ASSERT_EQ(mkfifo(fifo.c_str(), 0600), 0);
@@ -156,7 +156,7 @@ TEST(Verify, FileThatIsLeasedCannotBeOpened) {
   close(fd);
 }
 
-TEST(Verify, LinkStandsForItsFile) {
+TEST(Verify, LinkIsFollowedToItsFile) {
   const TempDir directory;
   const std::string file = directory.Write("file", {});
   const std::string link = directory / "link";
@@ -165,7 +165,7 @@ TEST(Verify, LinkStandsForItsFile) {
 }
 
 // U+00FC and U+00A0 are not control characters. U+009B and U+0080 are.
-TEST(Verify, EachFileHasOneLineWhateverItsName) {
+TEST(Verify, ControlCharactersInFileNamesAreEscaped) {
   constexpr char kNotAscii[] = "gr\xc3\xbcn \xc2\xa0 \xc2\x9b \xc2\x80 \xff";
   const TempDir directory;
   directory.Write("a\nb: trusted\t\x7f\\\x1b[2J", {});
@@ -176,13 +176,13 @@ TEST(Verify, EachFileHasOneLineWhateverItsName) {
 }
 
 // A kernel without the feature does not know its fcntl command, and refuses it with EINVAL.
-TEST(Verify, WithoutTheFeatureNothingIsTrusted) {
+TEST(Verify, KernelWithoutTheFeatureTrustsNoFile) {
   const TempDir directory;
   const std::string file = directory.Write("file", {});
   ExpectAnswer(VerifyHere({file}), 1, file + ": not trusted (errno 22, EINVAL)\n");
 }
 
-TEST(VerifyUsage, IsShownWithoutAFileAndForWhatLooksLikeAnOption) {
+TEST(VerifyUsage, IsShownWithoutAFileAndForAnOption) {
   const std::string usage =
       "usage: apktoolkit-verify FILE...\n(for a file whose name begins with -, write ./-NAME)\n";
   for (const Words& words : {Words{}, {"--help"}, {"/dev/null", "-x"}, {"-"}}) {
@@ -198,7 +198,7 @@ TEST(VerifyUsage, IsShownWithoutAFileAndForWhatLooksLikeAnOption) {
 }
 
 // If the answer cannot be written, the status must not be 0.
-TEST(VerifyOutput, ThatCannotBeWrittenIsAFailure) {
+TEST(VerifyOutput, IsAFailureIfItCannotBeWritten) {
   const TempDir directory;
   const std::string file = directory.Write("file", {});
   const Words trusting = {SimulatorPath(), "--verify", "--trust", file, file};
@@ -210,7 +210,7 @@ TEST(VerifyOutput, ThatCannotBeWrittenIsAFailure) {
 
 // ---- The simulator's option --verify.
 
-TEST(SimulatorVerify, DoesNotGoWithWhatTellsOfSigning) {
+TEST(SimulatorVerify, ExcludesTheOptionsForSigning) {
   for (const char* option : {"--install", "--strict", "--quiet", "--verbose", "--html=page"}) {
     const ProcessResult run = Verify({option, "/dev/null"});
     EXPECT_EQ(run.status, 2) << option;

@@ -79,12 +79,12 @@ size_t CountMappings() {
 
 }  // namespace
 
-TEST(VerificationReason, IsGoodForAGoodPackageAlone) {
+TEST(VerificationReason, IsGoodForAGoodPackageWithOrWithoutDex) {
   EXPECT_EQ(ReasonOf(PackageOptions()), Reason::kGood);
   EXPECT_EQ(ReasonOf(WithoutDex()), Reason::kGood);
 }
 
-TEST(VerificationReason, SaysWhatTheFileIs) {
+TEST(VerificationReason, SaysWhyTheFileIsNotAPackage) {
   testing::internal::CaptureStderr();
   EXPECT_EQ(Verification(-1).reason(), Reason::kNoDescriptor);
   testing::internal::GetCapturedStderr();
@@ -95,7 +95,7 @@ TEST(VerificationReason, SaysWhatTheFileIs) {
 
 // An entry whose name only begins with AndroidManifest.xml or META-INF/MANIFEST.MF is neither of
 // these manifests.
-TEST(VerificationReason, GoesByTheWholeNameOfAnEntry) {
+TEST(VerificationReason, DependsOnTheWholeNameOfAnEntry) {
   PackageOptions options = PlainJar();
   options.entries.push_back({"AndroidManifest.xml.bak", ToBytes("x")});
   EXPECT_EQ(ReasonOf(options), Reason::kNoPackage);
@@ -104,7 +104,7 @@ TEST(VerificationReason, GoesByTheWholeNameOfAnEntry) {
   EXPECT_EQ(ReasonOf(package), Reason::kUnsigned);
 }
 
-TEST(VerificationReason, SaysWhichPartOfTheSignatureIsNotThere) {
+TEST(VerificationReason, SaysWhichPartOfTheSignatureIsMissingOrUnreadable) {
   EXPECT_EQ(ReasonOf(Without(kManifestName)), Reason::kUnsigned);
   EXPECT_EQ(ReasonOf(Without("META-INF/CERT.SF")), Reason::kUnsigned);
   EXPECT_EQ(ReasonOf(WithUnreadable(kManifestName)), Reason::kSignatureUnreadable);
@@ -113,7 +113,7 @@ TEST(VerificationReason, SaysWhichPartOfTheSignatureIsNotThere) {
   EXPECT_EQ(ReasonOf(WithUnreadable("META-INF/CERT.RSA")), Reason::kNoRsaBlock);
 }
 
-TEST(VerificationReason, SaysWhichPartOfTheSignatureDoesNotParse) {
+TEST(VerificationReason, SaysWhichPartCannotBeParsed) {
   EXPECT_EQ(ReasonWithSignatureFile("Key:x"), Reason::kSignatureFileMalformed);
   EXPECT_EQ(ReasonWithSignatureFile("Key"), Reason::kSignatureFileMalformed);
   EXPECT_EQ(ReasonOf(WithManifest("Key:x")), Reason::kManifestMalformed);
@@ -150,7 +150,7 @@ TEST(VerificationReason, SaysWhichStepOfTheVerificationFails) {
   EXPECT_EQ(ReasonOf(WithTampered("classes.dex")), Reason::kDexRefused);
 }
 
-TEST(VerificationReason, HasATextOfItsOwnForEach) {
+TEST(VerificationReason, EachReasonHasItsOwnText) {
   std::set<std::string> texts;
   for (int i = 0; i <= static_cast<int>(Reason::kUnknown); ++i) {
     texts.insert(TextOf(static_cast<Reason>(i)));
@@ -160,7 +160,7 @@ TEST(VerificationReason, HasATextOfItsOwnForEach) {
 }
 
 // A verification that is made while another one exists has its own reason.
-TEST(VerificationReason, IsThatOfItsOwnPackage) {
+TEST(VerificationReason, TwoVerificationsHaveTheirOwnReasons) {
   const MemoryFile bad(WithTampered(kManifestName).Build());
   const MemoryFile good(MakePackage().Build());
   testing::internal::CaptureStderr();
@@ -172,7 +172,7 @@ TEST(VerificationReason, IsThatOfItsOwnPackage) {
   EXPECT_EQ(second.reason(), Reason::kGood);
 }
 
-TEST(VerificationLog, HasTheLinesAllTheSame) {
+TEST(VerificationLog, StillHasTheLinesOfTheTool) {
   const MemoryFile file(WithTampered(kManifestName).Build());
   testing::internal::CaptureStderr();
   const Verification verification(file.fd());
@@ -196,7 +196,7 @@ TEST(VerificationRelease, TwoThousandPackagesLeaveNoMappings) {
 
 // An Apk that is not released leaves its mapping. The test above would therefore detect a missing
 // release.
-TEST(VerificationRelease, WithoutItEachPackageLeavesAMapping) {
+TEST(VerificationRelease, UnreleasedPackageLeavesAMapping) {
   const MemoryFile file(MakePackage().Build());
   const size_t before = CountMappings();
   for (size_t i = 0; i < 100; ++i) ApkTools::Apk apk(file.fd());

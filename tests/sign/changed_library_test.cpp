@@ -122,7 +122,7 @@ class ChangedLibrary : public testing::Test {
   std::vector<Bytes> signed_;  // the bytes behind each signed descriptor
 };
 
-TEST_F(ChangedLibrary, LeftAloneIsSignedAfterOneDigest) { ExpectSigned(1); }
+TEST_F(ChangedLibrary, UnchangedLibraryIsSignedAfterOneDigest) { ExpectSigned(1); }
 
 // --- Touched, with unchanged bytes. One test for each way in which an installer may finish its
 // work.
@@ -150,71 +150,71 @@ class TouchedLibrary : public ChangedLibrary, public testing::WithParamInterface
 INSTANTIATE_TEST_SUITE_P(By, TouchedLibrary, testing::Values("chmod", "chown", "link", "utimensat"),
                          [](const auto& info) { return std::string(info.param); });
 
-TEST_P(TouchedLibrary, OnceWhileItIsReadIsSignedAfterASecondDigest) {
+TEST_P(TouchedLibrary, IsSignedAfter2DigestsIfTouchedBeforeTheFirstRead) {
   before_digest_[1] = [this] { Touch(); };
   ExpectSigned(2);
 }
 
-TEST_P(TouchedLibrary, OnceBeforeItsSecondOpeningIsSignedAfterASecondDigest) {
+TEST_P(TouchedLibrary, IsSignedAfter2DigestsIfTouchedBeforeTheSecondOpening) {
   before_second_open_ = [this] { Touch(); };
   ExpectSigned(2);
 }
 
-TEST_P(TouchedLibrary, TwiceIsSignedAfterAThirdDigest) {
+TEST_P(TouchedLibrary, IsSignedAfter3DigestsIfTouchedTwice) {
   before_digest_[1] = after_digest_[2] = [this] { Touch(); };
   ExpectSigned(3);
 }
 
-TEST_P(TouchedLibrary, AgainAndAgainIsRefusedAfterThreeDigests) {
+TEST_P(TouchedLibrary, IsRefusedAfter3DigestsIfTouchedBeforeEachRead) {
   for (Change& change : before_digest_) change = [this] { Touch(); };
   ExpectRefused(3);
 }
 
-TEST_P(TouchedLibrary, AfterEveryDigestIsRefusedAfterThree) {
+TEST_P(TouchedLibrary, IsRefusedAfter3DigestsIfTouchedAfterEachRead) {
   for (Change& change : after_digest_) change = [this] { Touch(); };
   ExpectRefused(3);
 }
 
 // --- Exchanged: by a rename, or behind a symbolic link.
 
-TEST_F(ChangedLibrary, ExchangedBeforeItsSecondOpeningForOtherBytesIsRefused) {
+TEST_F(ChangedLibrary, IsRefusedIfExchangedForOtherBytesBeforeSecondOpening) {
   before_second_open_ = [this] { Rename("evil"); };
   ExpectRefused(2);
 }
 
-TEST_F(ChangedLibrary, ExchangedBeforeItsSecondOpeningForTheSameBytesIsSigned) {
+TEST_F(ChangedLibrary, IsSignedIfExchangedForTheSameBytesBeforeSecondOpening) {
   before_second_open_ = [this] { Rename("good"); };
   ExpectSigned(2);
 }
 
-TEST_F(ChangedLibrary, ExchangedAfterItsSecondOpeningIsSignedAsItWasOpened) {
+TEST_F(ChangedLibrary, IsSignedAsOpenedIfExchangedAfterItsSecondOpening) {
   before_second_open_ = [this] { Rename("good"); };
   after_second_open_ = [this] { Rename("evil"); };
   ExpectSigned(2);
 }
 
 // The rename removes the name of the file that was read, which changes the file's ctime.
-TEST_F(ChangedLibrary, ExchangedAfterItsLastByteIsSignedAsItWasRead) {
+TEST_F(ChangedLibrary, IsSignedAsReadIfExchangedAfterItsLastByte) {
   before_second_open_ = [this] { Rename("good"); };
   after_digest_[2] = [this] { Rename("evil"); };
   ExpectSigned(3);
 }
 
-TEST_F(ChangedLibrary, ExchangedBeforeTheKernelSignsIsSignedAsItWasRead) {
+TEST_F(ChangedLibrary, IsSignedAsReadIfExchangedBeforeTheKernelSigns) {
   before_signing_ = [this] { Rename("evil"); };
   ExpectSigned(1);
 }
 
 // After the second opening, the path again leads to the file that was read, and the state of that
 // file is unchanged. Only the descriptor shows the exchange.
-TEST_F(ChangedLibrary, ExchangedForTheMomentOfItsOpeningIsRefused) {
+TEST_F(ChangedLibrary, IsRefusedIfExchangedOnlyDuringItsSecondOpening) {
   Link("good");
   before_second_open_ = [this] { Link("evil"); };
   after_second_open_ = [this] { Link("good"); };
   ExpectRefused(2);
 }
 
-TEST_F(ChangedLibrary, ExchangedForTheMomentOfItsFirstDigestIsRefused) {
+TEST_F(ChangedLibrary, IsRefusedIfExchangedFromSecondOpeningToSecondDigest) {
   Link("good");
   before_second_open_ = [this] { Link("evil"); };
   before_digest_[2] = [this] { Link("good"); };
@@ -223,7 +223,7 @@ TEST_F(ChangedLibrary, ExchangedForTheMomentOfItsFirstDigestIsRefused) {
 
 // --- No longer a regular file: refused at once.
 
-TEST_F(ChangedLibrary, ExchangedForAFifoIsRefusedAtOnce) {
+TEST_F(ChangedLibrary, IsRefusedAtOnceIfExchangedForAFifo) {
   before_second_open_ = [this] {
     EXPECT_EQ(mkfifo(file_.Path("fifo").c_str(), 0600), 0);
     Rename("fifo");
@@ -231,21 +231,21 @@ TEST_F(ChangedLibrary, ExchangedForAFifoIsRefusedAtOnce) {
   ExpectRefused(1);
 }
 
-TEST_F(ChangedLibrary, ExchangedForADirectoryIsRefusedAtOnce) {
+TEST_F(ChangedLibrary, IsRefusedAtOnceIfExchangedForADirectory) {
   before_second_open_ = [this] { Link("lib"); };
   ExpectRefused(1);
 }
 
 // A file system may give a removed file's inode number to the next file. If that file has the same
 // size, and times of the same clock tick, it looks like the file that was read.
-TEST_F(ChangedLibrary, IsKeptOpenUntilItIsOpenedAgainSoThatNoOtherFileGetsItsNumber) {
+TEST_F(ChangedLibrary, StaysOpenUntilItIsOpenedAgain) {
   after_digest_[1] = [this] { EXPECT_EQ(DescriptorsOfLibrary(), 1); };
   before_second_open_ = [this] { EXPECT_EQ(DescriptorsOfLibrary(), 1); };
   after_second_open_ = [this] { EXPECT_EQ(DescriptorsOfLibrary(), 2); };
   ExpectSigned(1);
 }
 
-TEST_F(ChangedLibrary, ThatAppearsWhenItsFirstOpeningHasFailedIsRefused) {
+TEST_F(ChangedLibrary, IsRefusedIfItAppearsAfterItsFirstOpeningFailed) {
   int asked = 0;
   file_.phone.open_error = [&](const char* path, int) {
     return path == target_ && ++asked == 1 ? ENOENT : 0;
@@ -256,23 +256,23 @@ TEST_F(ChangedLibrary, ThatAppearsWhenItsFirstOpeningHasFailedIsRefused) {
 
 // --- Written to in place, which the times show.
 
-TEST_F(ChangedLibrary, WrittenToBeforeItsSecondOpeningIsRefused) {
+TEST_F(ChangedLibrary, IsRefusedIfWrittenToBeforeItsSecondOpening) {
   before_second_open_ = [this] { WriteInPlace(); };
   ExpectRefused(2);
 }
 
-TEST_F(ChangedLibrary, WrittenToAfterItsSecondOpeningIsRefused) {
+TEST_F(ChangedLibrary, IsRefusedIfWrittenToAfterItsSecondOpening) {
   after_second_open_ = [this] { WriteInPlace(); };
   ExpectRefused(2);
 }
 
-TEST_F(ChangedLibrary, WrittenToAfterItsSecondDigestIsRefused) {
+TEST_F(ChangedLibrary, IsRefusedIfWrittenToAfterItsSecondDigest) {
   before_second_open_ = [this] { Rename("good"); };
   after_digest_[2] = [this] { WriteInPlace(); };
   ExpectRefused(3);
 }
 
-TEST_F(ChangedLibrary, WrittenToAfterItsThirdDigestIsRefused) {
+TEST_F(ChangedLibrary, IsRefusedIfWrittenToAfterItsThirdDigest) {
   before_second_open_ = [this] { Rename("good"); };
   after_digest_[2] = [this] {
     UntilNoticed([this] { EXPECT_EQ(chmod(target_.c_str(), 0600), 0); });
@@ -284,7 +284,7 @@ TEST_F(ChangedLibrary, WrittenToAfterItsThirdDigestIsRefused) {
 // --- Under a lease. The tool's open breaks the lease, and the tool waits until the holder gives
 // the lease up.
 
-TEST_F(ChangedLibrary, ThatIsLeasedAtItsSecondOpeningIsSigned) {
+TEST_F(ChangedLibrary, IsSignedIfLeasedAtItsSecondOpening) {
   int asked = 0;
   file_.phone.open_error = [&](const char* path, int) {
     return path == target_ && ++asked == 2 ? EWOULDBLOCK : 0;
@@ -295,7 +295,7 @@ TEST_F(ChangedLibrary, ThatIsLeasedAtItsSecondOpeningIsSigned) {
 
 // Before the tool opens the file again, the holder of the lease could put another file in its
 // place.
-TEST_F(ChangedLibrary, ThatIsLeasedAndThenAFifoIsNotWaitedFor) {
+TEST_F(ChangedLibrary, FifoThatReplacesALeasedLibraryIsNotWaitedFor) {
   int asked = 0;
   file_.phone.open_error = [&](const char* path, int) {
     if (path != target_ || ++asked != 2) return 0;
@@ -310,7 +310,7 @@ TEST_F(ChangedLibrary, ThatIsLeasedAndThenAFifoIsNotWaitedFor) {
                      Error("Error 11: Resource temporarily unavailable.\n"), Finished()}));
 }
 
-TEST_F(ChangedLibrary, ThatIsLeasedAndThenGoneIsNotOpened) {
+TEST_F(ChangedLibrary, IsNotOpenedIfRemovedDuringTheLease) {
   int asked = 0;
   file_.phone.open_error = [&](const char* path, int) {
     if (path != target_ || ++asked != 2) return 0;

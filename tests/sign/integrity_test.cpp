@@ -45,33 +45,33 @@ TEST(VeltResultCode, EveryFailureIs65536) {
   EXPECT_EQ(VeltSignFd(7, kPayload), kFailure);
 }
 
-TEST(VeltSignFd, SignsWithThePayloadAfterReadingTheOwnIntegrity) {
+TEST(VeltSignFd, SignsWithThePayloadAfterReadingItsOwnIntegrity) {
   Phone phone;
   EXPECT_EQ(VeltSignFd(7, kPayload), 0U);
   EXPECT_EQ(phone.events, Events({kSelf, "sign 7 0300aabbcc"}));
 }
 
-TEST(VeltSignFd, AnEmptyPayloadIsTwoZeroBytes) {
+TEST(VeltSignFd, EmptyPayloadIsTwoZeroBytes) {
   Phone phone;
   const uint8_t empty[2] = {};
   EXPECT_EQ(VeltSignFd(7, empty), 0U);
   EXPECT_EQ(phone.events, Events({kSelf, "sign 7 0000"}));
 }
 
-TEST(VeltSignFd, ANullPayloadTouchesNeitherProcNorTheKernel) {
+TEST(VeltSignFd, NullPayloadFailsWithoutAskingProcOrTheKernel) {
   Phone phone;
   EXPECT_EQ(VeltSignFd(7, nullptr), 0x10000U);
   EXPECT_EQ(phone.events, Events());
 }
 
-TEST(VeltSignFd, AnIntegrityOfZeroMayNotSign) {
+TEST(VeltSignFd, IntegrityOf0PreventsSigning) {
   Phone phone;
   phone.integrity = {"0\n"};
   EXPECT_EQ(VeltSignFd(7, kPayload), 0x10000U);
   EXPECT_EQ(phone.events, Events({kSelf}));
 }
 
-TEST(VeltSignFd, TheSmallestAndTheLargestSettledValueMaySign) {
+TEST(VeltSignFd, SmallestAndLargestSettledValuesAllowSigning) {
   for (const char* value : {"1", "fffffffe"}) {
     Phone phone;
     phone.integrity = {value};
@@ -80,7 +80,7 @@ TEST(VeltSignFd, TheSmallestAndTheLargestSettledValueMaySign) {
   }
 }
 
-TEST(VeltSignFd, WaitsInSteps10MillisecondsLongUntilTheValueSettles) {
+TEST(VeltSignFd, WaitsInStepsOf10MillisecondsUntilTheValueSettles) {
   Phone phone;
   phone.integrity = {"ffffffff\n", "ffffffff\n", "1f\n"};
   EXPECT_EQ(VeltSignFd(7, kPayload), 0U);
@@ -90,7 +90,7 @@ TEST(VeltSignFd, WaitsInSteps10MillisecondsLongUntilTheValueSettles) {
 
 // The value settles after 10000 steps of 10 ms, which are 100 seconds. The Phone does not really
 // sleep.
-TEST(VeltSignFd, WaitsHoweverLongTheValueTakes) {
+TEST(VeltSignFd, WaitsEven100SecondsUntilTheValueSettles) {
   constexpr size_t kSteps = 10000;
   Phone phone;
   phone.integrity.assign(kSteps, "ffffffff\n");
@@ -100,21 +100,21 @@ TEST(VeltSignFd, WaitsHoweverLongTheValueTakes) {
   EXPECT_EQ(phone.events.back(), "sign 7 0300aabbcc");
 }
 
-TEST(VeltSignFd, AValueThatSettlesToZeroMayNotSign) {
+TEST(VeltSignFd, ValueThatSettlesTo0PreventsSigning) {
   Phone phone;
   phone.integrity = {"ffffffff\n", "0\n"};
   EXPECT_EQ(VeltSignFd(7, kPayload), 0x10000U);
   EXPECT_EQ(phone.events, Events({kSelf, "sleep 10000", kSelf}));
 }
 
-TEST(VeltSignFd, AMissingIntegrityFileMayNotSign) {
+TEST(VeltSignFd, MissingIntegrityFilePreventsSigning) {
   Phone phone;
   phone.integrity = {Phone::kNoFile};
   EXPECT_EQ(VeltSignFd(7, kPayload), 0x10000U);
   EXPECT_EQ(phone.events, Events({kSelf}));
 }
 
-TEST(VeltSignFd, TheRefusalOfTheKernelKeepsItsErrno) {
+TEST(VeltSignFd, RefusalByTheKernelKeepsItsErrno) {
   Phone phone;
   phone.sign_errno = EPERM;
   errno = 0;
@@ -122,20 +122,20 @@ TEST(VeltSignFd, TheRefusalOfTheKernelKeepsItsErrno) {
   EXPECT_EQ(errno, EPERM);
 }
 
-TEST(VeltSignFd, AFileThatIsGoneAfterTheWaitMayNotSign) {
+TEST(VeltSignFd, IntegrityFileMissingAfterTheWaitPreventsSigning) {
   Phone phone;
   phone.integrity = {"ffffffff\n", Phone::kNoFile};
   EXPECT_EQ(VeltSignFd(7, kPayload), 0x10000U);
   EXPECT_EQ(phone.events, Events({kSelf, "sleep 10000", kSelf}));
 }
 
-TEST(VeltVerifyFd, ATrustedFileGivesZeroWithoutAskingForTheOwnIntegrity) {
+TEST(VeltVerifyFd, TrustedFileGives0WithoutReadingTheIntegrity) {
   Phone phone;
   EXPECT_EQ(VeltVerifyFd(9), 0U);
   EXPECT_EQ(phone.events, Events({"verify 9"}));
 }
 
-TEST(VeltVerifyFd, AFileThatTheKernelHasNotSignedFailsWithTheErrnoOfTheKernel) {
+TEST(VeltVerifyFd, UnsignedFileFailsWithTheKernelsErrno) {
   Phone phone;
   phone.verify_errno = ENOKEY;
   errno = 0;
@@ -143,14 +143,14 @@ TEST(VeltVerifyFd, AFileThatTheKernelHasNotSignedFailsWithTheErrnoOfTheKernel) {
   EXPECT_EQ(errno, ENOKEY);
 }
 
-TEST(VeltVerifyFd, AKernelWithoutTheFeatureRefuses) {
+TEST(VeltVerifyFd, KernelWithoutTheFeatureRefuses) {
   // Without a Phone, this machine's own kernel answers. It does not know the command.
   errno = 0;
   EXPECT_EQ(VeltVerifyFd(0), 0x10000U);
   EXPECT_EQ(errno, EINVAL);
 }
 
-TEST(VeltTaskReadIntegrity, ProcessIdZeroReadsTheOwnFile) {
+TEST(VeltTaskReadIntegrity, ProcessId0ReadsTheFileOfTheCaller) {
   Phone phone;
   uint32_t value = 5;
   EXPECT_EQ(VeltTaskReadIntegrity(0, 0, &value), 0U);
@@ -158,7 +158,7 @@ TEST(VeltTaskReadIntegrity, ProcessIdZeroReadsTheOwnFile) {
   EXPECT_EQ(phone.events, Events({kSelf}));
 }
 
-TEST(VeltTaskReadIntegrity, AProcessIdReadsTheFileOfThatTask) {
+TEST(VeltTaskReadIntegrity, OtherProcessIdReadsTheFileOfThatTask) {
   Phone phone;
   uint32_t value = 5;
   EXPECT_EQ(VeltTaskReadIntegrity(42, 0, &value), 0U);
@@ -166,7 +166,7 @@ TEST(VeltTaskReadIntegrity, AProcessIdReadsTheFileOfThatTask) {
   EXPECT_EQ(phone.events, Events({"integrity /proc/42/integrity/value"}));
 }
 
-TEST(VeltTaskReadIntegrity, ANegativeProcessIdFailsWithoutOpeningAnything) {
+TEST(VeltTaskReadIntegrity, NegativeProcessIdFailsWithoutOpeningAnything) {
   Phone phone;
   uint32_t value = 5;
   EXPECT_EQ(VeltTaskReadIntegrity(-1, 0, &value), 0x10000U);
@@ -175,7 +175,7 @@ TEST(VeltTaskReadIntegrity, ANegativeProcessIdFailsWithoutOpeningAnything) {
   EXPECT_EQ(phone.other_fopens, 0);
 }
 
-TEST(VeltTaskReadIntegrity, ANullValueFailsWithoutOpeningAnything) {
+TEST(VeltTaskReadIntegrity, NullValueFailsWithoutReadingTheFile) {
   Phone phone;
   EXPECT_EQ(VeltTaskReadIntegrity(0, 0, nullptr), 0x10000U);
   EXPECT_EQ(phone.events, Events());
@@ -192,7 +192,7 @@ TEST(VeltTaskReadIntegrity, TextThatIsNotHexadecimalLeavesTheValueUnchanged) {
   }
 }
 
-TEST(VeltTaskReadIntegrity, AnEmptyFileFails) {
+TEST(VeltTaskReadIntegrity, EmptyFileFails) {
   Phone phone;
   phone.integrity = {""};
   uint32_t value = 5;
@@ -200,7 +200,7 @@ TEST(VeltTaskReadIntegrity, AnEmptyFileFails) {
   EXPECT_EQ(value, 5U);
 }
 
-TEST(VeltTaskReadIntegrity, WithoutWaitingAnUnsettledValueIsReturnedAsItIs) {
+TEST(VeltTaskReadIntegrity, UnsettledValueIsReturnedWithoutWaiting) {
   Phone phone;
   phone.integrity = {"ffffffff\n", "1f\n"};
   uint32_t value = 5;
@@ -219,7 +219,7 @@ TEST(VeltTaskReadIntegrity, OnlyBit0AsksToWait) {
   EXPECT_EQ(value, 0x1fU);
 }
 
-TEST(VeltTaskReadIntegrity, AFileThatGoesBadWhileWaitingFailsWithTheLastValueRead) {
+TEST(VeltTaskReadIntegrity, FileThatGoesBadWhileWaitingFailsWithTheLastValueRead) {
   Phone phone;
   phone.integrity = {"ffffffff\n", "gone\n"};
   uint32_t value = 5;
@@ -228,7 +228,7 @@ TEST(VeltTaskReadIntegrity, AFileThatGoesBadWhileWaitingFailsWithTheLastValueRea
   EXPECT_EQ(phone.events, Events({kSelf, "sleep 10000", kSelf}));
 }
 
-TEST(VeltTaskReadIntegrity, AFileThatIsGoneAfterTheWaitFailsWithTheLastValueRead) {
+TEST(VeltTaskReadIntegrity, FileMissingAfterTheWaitFailsWithTheLastValueRead) {
   Phone phone;
   phone.integrity = {"ffffffff\n", Phone::kNoFile};
   uint32_t value = 5;

@@ -21,7 +21,7 @@ bool Says(const ProcessResult& run, const std::string& text) {
   return run.errors.find(text) != std::string::npos;
 }
 
-TEST(Main, WithStandardInputTheFileIsWorkedOn) {
+TEST(Main, ProcessesTheFileIfStandardInputIsOpen) {
   const DiskFile file(MakePackage().Build());
   const ProcessResult run = RunTool("\"$0\" \"$1\" </dev/null", file.path());
   EXPECT_EQ(run.status, 0);
@@ -29,14 +29,14 @@ TEST(Main, WithStandardInputTheFileIsWorkedOn) {
 }
 
 // Without standard input, the file gets descriptor 0, which main() refuses.
-TEST(Main, WithoutStandardInputTheFileIsLeftAlone) {
+TEST(Main, IgnoresTheFileIfStandardInputIsClosed) {
   const DiskFile file(MakePackage().Build());
   const ProcessResult run = RunTool("\"$0\" \"$1\" <&-", file.path());
   EXPECT_EQ(run.status, 0);
   EXPECT_EQ(run.output + run.errors, "");
 }
 
-TEST(Main, AFifoIsRefusedWithoutWaiting) {
+TEST(Main, FifoIsRefusedWithoutWaiting) {
   const TempDir directory;
   ASSERT_EQ(mkfifo((directory / "fifo").c_str(), 0600), 0);
   const ProcessResult run = RunTool("timeout 20 \"$0\" \"$1\" </dev/null", directory / "fifo");
@@ -46,7 +46,7 @@ TEST(Main, AFifoIsRefusedWithoutWaiting) {
   EXPECT_TRUE(Says(run, "Zip archive is not valid for fd=3")) << run.errors;
 }
 
-TEST(Main, ALeasedFileIsWorkedOnOnceItsHolderGivesItUp) {
+TEST(Main, LeasedFileIsProcessedAfterTheLeaseIsGivenUp) {
   const DiskFile file(MakePackage(WithLibraries({})).Build());
   const Lease lease(file.path());
   if (!lease.IsHeld()) GTEST_SKIP() << "the file system of " << file.path() << " knows no leases";
@@ -58,7 +58,7 @@ TEST(Main, ALeasedFileIsWorkedOnOnceItsHolderGivesItUp) {
 
 // The parser of the signature block prints a line about the bad block. The line stays in the buffer
 // of standard output until the process ends.
-TEST(Main, ALineThatStandardOutputCannotTakeEndsTheProcessAfterItsSteps) {
+TEST(Main, ClosedPipeOnStandardOutputEndsTheRunAfterItsSteps) {
   Package package = MakePackage();
   package.Item("META-INF/CERT.RSA").data = ToBytes("no block");
   const DiskFile file(package.Build());

@@ -50,21 +50,21 @@ std::string RegisterJar(int fd, const std::string& path) {
   return "register " + std::to_string(fd) + " " + path + " " + Hex(block, sizeof(block));
 }
 
-TEST(ZuSign, APackageWithoutThePermissionIsLeftAlone) {
+TEST(ZuSign, PackageWithoutThePermissionIsSkippedSilently) {
   ArchiveOnPhone file(MakePackage());
   ZuSign(file.apk, file.fd(), file.fd());
   EXPECT_EQ(file.phone.events, Events());
   EXPECT_EQ(file.log.records(), Records());
 }
 
-TEST(ZuSign, APackageWithThePermissionIsRegisteredUnderItsNameWithItsSignersKey) {
+TEST(ZuSign, PackageIsRegisteredUnderItsNameWithItsSignersKey) {
   ArchiveOnPhone file(SecureStoragePackage());
   ZuSign(file.apk, file.fd(), file.fd());
   EXPECT_EQ(file.phone.events, Events({RegisterPackage(file.fd())}));
   EXPECT_EQ(file.log.records(), Records({Info("ZuAddCertificate: ZuNewCertificate return 0.\n")}));
 }
 
-TEST(ZuSign, TheSecondResultOfSuccessIsLoggedAsSuccess) {
+TEST(ZuSign, Result65540IsLoggedAsSuccess) {
   ArchiveOnPhone file(SecureStoragePackage());
   file.phone.zu_result = 0x10004;
   ZuSign(file.apk, file.fd(), file.fd());
@@ -83,13 +83,13 @@ TEST(ZuSign, EveryOtherResultIsAFailure) {
   }
 }
 
-TEST(ZuSign, TheRegistrationIsMadeForTheSecondDescriptor) {
+TEST(ZuSign, RegistersTheSecondDescriptor) {
   ArchiveOnPhone file(SecureStoragePackage());
   ZuSign(file.apk, file.fd(), 0);
   EXPECT_EQ(file.phone.events, Events({RegisterPackage(0)}));
 }
 
-TEST(ZuSign, APackageWithThePermissionThatTurnedBadIsNotRegistered) {
+TEST(ZuSign, PackageWithABadDexFileIsNotRegistered) {
   // The permission is read only if META-INF/MANIFEST.MF verified. In this package, therefore, only
   // the dex file is bad.
   Package package = SecureStoragePackage();
@@ -104,7 +104,7 @@ TEST(ZuSign, APackageWithThePermissionThatTurnedBadIsNotRegistered) {
                            ", path=/memfd:test (deleted)\n")}));
 }
 
-TEST(ZuSign, APackageWhoseSecondDescriptorHasNoPathIsReportedAndRegistered) {
+TEST(ZuSign, PackageWhoseSecondFdHasNoPathIsReportedAndRegistered) {
   ArchiveOnPhone file(SecureStoragePackage());
   file.phone.nameless_fds = {file.fd()};
   const std::string fd = std::to_string(file.fd());
@@ -114,7 +114,7 @@ TEST(ZuSign, APackageWhoseSecondDescriptorHasNoPathIsReportedAndRegistered) {
                                          Info("ZuAddCertificate: ZuNewCertificate return 0.\n")}));
 }
 
-TEST(ZuSign, AJarWithoutTheAttributeIsLeftAlone) {
+TEST(ZuSign, JarWithoutTheAttributeIsSkippedSilently) {
   ArchiveOnPhone file(MakePackage(PlainJar()));
   ZuSign(file.apk, file.fd(), file.fd());
   EXPECT_EQ(file.phone.events, Events());
@@ -122,14 +122,14 @@ TEST(ZuSign, AJarWithoutTheAttributeIsLeftAlone) {
 }
 
 // Only the size of the attribute is read, from the file of the first descriptor.
-TEST(ZuSign, TheAttributeIsAskedOfTheFirstDescriptorWithoutABuffer) {
+TEST(ZuSign, AttributeSizeIsReadFromTheFirstDescriptor) {
   ArchiveOnPhone file(MakePackage(PlainJar()));
   file.phone.zu_attribute_size = 1;
   ZuSign(file.apk, file.fd(), 78);
   EXPECT_EQ(file.phone.attributes, Events({std::to_string(file.fd()) + " user.zu null 0"}));
 }
 
-TEST(ZuSign, AJarWithAnEmptyAttributeIsLeftAlone) {
+TEST(ZuSign, JarWithAnEmptyAttributeIsSkippedSilently) {
   ArchiveOnPhone file(MakePackage(PlainJar()));
   file.phone.zu_attribute_size = 0;
   ZuSign(file.apk, file.fd(), file.fd());
@@ -137,7 +137,7 @@ TEST(ZuSign, AJarWithAnEmptyAttributeIsLeftAlone) {
   EXPECT_EQ(file.log.records(), Records());
 }
 
-TEST(ZuSign, AJarWithTheAttributeIsRegisteredUnderItsPathWithFourChainedDigests) {
+TEST(ZuSign, JarIsRegisteredUnderItsPathWithFourChainedDigests) {
   ArchiveOnPhone file(MakePackage(PlainJar()));
   file.phone.zu_attribute_size = 1;
   ZuSign(file.apk, file.fd(), file.fd());
@@ -146,7 +146,7 @@ TEST(ZuSign, AJarWithTheAttributeIsRegisteredUnderItsPathWithFourChainedDigests)
                                          Info("ZuAddCertificate: ZuNewCertificate return 0.\n")}));
 }
 
-TEST(ZuSign, TheKeyBlockOfAJarIs128Bytes) {
+TEST(ZuSign, KeyBlockOfAJarIs128Bytes) {
   ArchiveOnPhone file(MakePackage(PlainJar()));
   file.phone.zu_attribute_size = 1;
   ZuSign(file.apk, file.fd(), file.fd());
@@ -155,7 +155,7 @@ TEST(ZuSign, TheKeyBlockOfAJarIs128Bytes) {
   EXPECT_EQ(event.size() - event.rfind(' ') - 1, 2 * 128U);
 }
 
-TEST(ZuSign, AJarWithoutAPathIsReportedAndNotRegistered) {
+TEST(ZuSign, JarWithoutAPathIsReportedAndNotRegistered) {
   ArchiveOnPhone file(MakePackage(PlainJar()));
   file.phone.zu_attribute_size = 1;
   file.phone.nameless_fds = {file.fd()};
@@ -165,7 +165,7 @@ TEST(ZuSign, AJarWithoutAPathIsReportedAndNotRegistered) {
             Records({Error("Can't get jar location from fd=" + std::to_string(file.fd()) + "\n")}));
 }
 
-TEST(ZuSign, AJarWhoseSecondDescriptorHasNoPathIsReportedAndRegistered) {
+TEST(ZuSign, JarWhoseSecondFdHasNoPathIsReportedAndRegistered) {
   ArchiveOnPhone file(MakePackage(PlainJar()));
   file.phone.zu_attribute_size = 1;
   file.phone.nameless_fds = {78};
@@ -176,7 +176,7 @@ TEST(ZuSign, AJarWhoseSecondDescriptorHasNoPathIsReportedAndRegistered) {
                                          Info("ZuAddCertificate: ZuNewCertificate return 0.\n")}));
 }
 
-TEST(ZuSign, TheRefusalOfAJarIsReported) {
+TEST(ZuSign, RefusedRegistrationOfAJarIsReported) {
   ArchiveOnPhone file(MakePackage(PlainJar()));
   file.phone.zu_attribute_size = 1;
   file.phone.zu_result = 5;
@@ -185,7 +185,7 @@ TEST(ZuSign, TheRefusalOfAJarIsReported) {
                                          Error("ZuAddCertificate: ZuNewCertificate failed 5.\n")}));
 }
 
-TEST(ZuSign, AFileThatIsNotAZipArchiveStopsSilentlyAtThePermission) {
+TEST(ZuSign, FileThatIsNotAZipArchiveIsSkippedSilently) {
   LogCapture log;
   Phone phone;
   phone.zu_attribute_size = 1;

@@ -37,7 +37,7 @@ LogRecord SignStarts(int fd) {
 
 // --- VeltSign -----------------------------------------------------------------------------------
 
-TEST(VeltSign, AGoodPackageIsSignedWithTheDigestOfItsSignersKey) {
+TEST(VeltSign, GoodPackageIsSignedWithTheDigestOfItsSignersKey) {
   PackageOnPhone file(MakePackage());
   EXPECT_EQ(file.Sign(), 0U);
   EXPECT_EQ(file.phone.events, Events({kSelf, SignEvent(file.fd())}));
@@ -45,7 +45,7 @@ TEST(VeltSign, AGoodPackageIsSignedWithTheDigestOfItsSignersKey) {
                                          Info("VeltSign finished: 0.\n")}));
 }
 
-TEST(VeltSign, ThePayloadOfAPackageIs34BytesThatStartWith32And0) {
+TEST(VeltSign, PayloadOfAPackageIs34BytesThatStartWith32And0) {
   PackageOnPhone file(MakePackage());
   file.Sign();
   ASSERT_EQ(file.phone.events.size(), 2U);
@@ -55,7 +55,7 @@ TEST(VeltSign, ThePayloadOfAPackageIs34BytesThatStartWith32And0) {
   EXPECT_EQ(payload.substr(0, 4), "2000");
 }
 
-TEST(VeltSign, TheDescriptorForMessagesIsNotTheOneThatIsSigned) {
+TEST(VeltSign, SignsTheSecondDescriptorAndOnlyLogsTheFirst) {
   PackageOnPhone file(MakePackage());
   EXPECT_EQ(VeltSign(file.apk(), 77, file.fd()), 0U);
   EXPECT_EQ(file.phone.events, Events({kSelf, SignEvent(file.fd())}));
@@ -63,7 +63,7 @@ TEST(VeltSign, TheDescriptorForMessagesIsNotTheOneThatIsSigned) {
             Info("VeltSign starts: zip_fd = 77, fd = " + std::to_string(file.fd()) + ".\n"));
 }
 
-TEST(VeltSign, APackageThatDidNotVerifyIsNotSignedAndGetsNoMessageOfItsOwn) {
+TEST(VeltSign, BadPackageIsNotSignedAndNoReasonIsLogged) {
   PackageOnPhone file(BadPackage());
   EXPECT_EQ(file.Sign(), kVeltFailure);
   EXPECT_EQ(file.phone.events, Events());
@@ -71,7 +71,7 @@ TEST(VeltSign, APackageThatDidNotVerifyIsNotSignedAndGetsNoMessageOfItsOwn) {
                                          Info("VeltSign finished: 65536.\n")}));
 }
 
-TEST(VeltSign, AFileThatIsNotAZipArchiveIsRefused) {
+TEST(VeltSign, FileThatIsNotAZipArchiveIsRefused) {
   LogCapture log;
   Phone phone;
   MemoryFile file(ToBytes("no archive"));
@@ -85,7 +85,7 @@ TEST(VeltSign, AFileThatIsNotAZipArchiveIsRefused) {
                Error("Zip archive is not valid for fd=77\n")}));
 }
 
-TEST(VeltSign, ARefusalOfTheKernelIsReportedWithItsErrno) {
+TEST(VeltSign, RefusalByTheKernelIsReportedWithItsErrno) {
   PackageOnPhone file(MakePackage());
   file.phone.sign_errno = EPERM;
   EXPECT_EQ(file.Sign(), kVeltFailure);
@@ -97,7 +97,7 @@ TEST(VeltSign, ARefusalOfTheKernelIsReportedWithItsErrno) {
                      Info("VeltSign finished: 65536.\n")}));
 }
 
-TEST(VeltSign, ATrustedJarIsSignedWithAnEmptyPayload) {
+TEST(VeltSign, TrustedJarIsSignedWithAnEmptyPayload) {
   PackageOnPhone file(MakePackage(PlainJar()));
   EXPECT_EQ(file.Sign(), 0U);
   const std::string fd = std::to_string(file.fd());
@@ -107,14 +107,14 @@ TEST(VeltSign, ATrustedJarIsSignedWithAnEmptyPayload) {
                      Info("VeltSign finished: 0.\n")}));
 }
 
-TEST(VeltSign, AJarIsVerifiedByItsOwnDescriptorAndSignedByTheOther) {
+TEST(VeltSign, JarIsVerifiedByItsOwnDescriptorAndSignedByTheSecond) {
   PackageOnPhone file(MakePackage(PlainJar()));
   EXPECT_EQ(VeltSign(file.apk(), file.fd(), 77), 0U);
   EXPECT_EQ(file.phone.events,
             Events({"verify " + std::to_string(file.fd()), kSelf, "sign 77 0000"}));
 }
 
-TEST(VeltSign, AJarThatTheKernelDoesNotTrustIsReportedAtInfoLevelAndNotSigned) {
+TEST(VeltSign, UntrustedJarIsReportedAtInfoLevelAndNotSigned) {
   PackageOnPhone file(MakePackage(PlainJar()));
   file.phone.verify_errno = ENOKEY;
   EXPECT_EQ(file.Sign(), kVeltFailure);
@@ -125,7 +125,7 @@ TEST(VeltSign, AJarThatTheKernelDoesNotTrustIsReportedAtInfoLevelAndNotSigned) {
                      Info("VeltSign finished: 65536.\n")}));
 }
 
-TEST(VeltSign, ATrustedJarThatTheKernelDoesNotSignIsReported) {
+TEST(VeltSign, TrustedJarThatTheKernelDoesNotSignIsReported) {
   PackageOnPhone file(MakePackage(PlainJar()));
   file.phone.sign_errno = EROFS;
   EXPECT_EQ(file.Sign(), kVeltFailure);
@@ -138,7 +138,7 @@ TEST(VeltSign, ATrustedJarThatTheKernelDoesNotSignIsReported) {
 
 // --- VeltSignJni --------------------------------------------------------------------------------
 
-TEST(VeltSignJni, ALibraryIsSignedOnItsOwnDescriptorWithThePayloadOfThePackage) {
+TEST(VeltSignJni, LibraryIsSignedByItsOwnDescriptorWithThePackagesPayload) {
   const ZipItem library = Library("lib/arm64-v8a/libfoo.so");
   PackageOnPhone file(MakePackage(WithLibraries({library})));
   file.Install("lib/arm64/libfoo.so", library);
@@ -149,7 +149,7 @@ TEST(VeltSignJni, ALibraryIsSignedOnItsOwnDescriptorWithThePayloadOfThePackage) 
             Records({Starts(file.fd()), Info("VeltSignOat: Apk case.\n"), Finished()}));
 }
 
-TEST(VeltSignJni, TheDescriptorOfALibraryIsClosed) {
+TEST(VeltSignJni, DescriptorOfALibraryIsClosed) {
   const ZipItem library = Library("lib/arm64-v8a/libfoo.so");
   PackageOnPhone file(MakePackage(WithLibraries({library})));
   file.Install("lib/arm64/libfoo.so", library);
@@ -158,7 +158,7 @@ TEST(VeltSignJni, TheDescriptorOfALibraryIsClosed) {
 }
 
 // This happens if the process was started without standard input.
-TEST(VeltSignJni, ALibraryMayHaveDescriptor0) {
+TEST(VeltSignJni, LibraryMayHaveDescriptor0) {
   const ZipItem library = Library("lib/arm64-v8a/libfoo.so");
   PackageOnPhone file(MakePackage(WithLibraries({library})));
   file.Install("lib/arm64/libfoo.so", library);
@@ -170,7 +170,7 @@ TEST(VeltSignJni, ALibraryMayHaveDescriptor0) {
   EXPECT_EQ(file.phone.events, Events({kSelf, SignEvent(0)}));
 }
 
-TEST(VeltSignJni, ALibraryIsOpenedWithoutWaiting) {
+TEST(VeltSignJni, LibraryIsOpenedWithoutWaiting) {
   const ZipItem library = Library("lib/arm64-v8a/libfoo.so");
   PackageOnPhone file(MakePackage(WithLibraries({library})));
   file.Install("lib/arm64/libfoo.so", library);
@@ -181,7 +181,7 @@ TEST(VeltSignJni, ALibraryIsOpenedWithoutWaiting) {
 }
 
 // A file among the libraries that is not a library is left alone, even if the manifest lists it.
-TEST(VeltSignJni, AnEntryWithAnotherEndingIsNotALibrary) {
+TEST(VeltSignJni, EntryWithAnotherEndingIsNotALibrary) {
   const std::vector<ZipItem> others = {Library("lib/arm64-v8a/libfoo.so.txt"),
                                        Library("lib/arm64-v8a/libfoo.SO"),
                                        Library("lib/arm64-v8a/so")};
@@ -194,14 +194,14 @@ TEST(VeltSignJni, AnEntryWithAnotherEndingIsNotALibrary) {
   EXPECT_EQ(file.log.records(), Records({Starts(file.fd()), Finished()}));
 }
 
-TEST(VeltSignJni, APackageWithoutLibrariesSignsNothing) {
+TEST(VeltSignJni, SignsNothingForAPackageWithoutLibraries) {
   PackageOnPhone file(MakePackage(WithLibraries({})));
   EXPECT_EQ(file.SignJni(), 0U);
   EXPECT_EQ(file.phone.events, Events());
   EXPECT_EQ(file.log.records(), Records({Starts(file.fd()), Finished()}));
 }
 
-TEST(VeltSignJni, AnEntryOfNoRowIsPassedOverWithoutAMessage) {
+TEST(VeltSignJni, EntryOfAnUnknownAbiIsSkippedSilently) {
   const ZipItem library = Library("lib/x86/libfoo.so");
   PackageOnPhone file(MakePackage(WithLibraries({library})));
   file.Install("lib/x86/libfoo.so", library);
@@ -212,7 +212,7 @@ TEST(VeltSignJni, AnEntryOfNoRowIsPassedOverWithoutAMessage) {
 
 // The order of the two entries in the iteration depends on their names. The loop tries names until
 // each entry has come first.
-TEST(VeltSignJni, ALibraryOfAnotherAbiDoesNotEndTheWalkInEitherOrder) {
+TEST(VeltSignJni, LibraryOfAnotherAbiDoesNotEndTheIteration) {
   const ZipItem library = Library("lib/arm64-v8a/libfoo.so");
   int first = 0, last = 0;  // how often the other library came first or last
   for (int i = 0; i < 100 && (first == 0 || last == 0); ++i) {
@@ -239,7 +239,7 @@ bool IsFoundAt(const std::string& entry, const std::string& installed) {
   return file.phone.events == Events({kSelf, SignEvent(file.fd() + 1)});
 }
 
-TEST(VeltSignJni, EveryRowOfTheDirectoryTableIsFoundInItsDirectoryAndNowhereElse) {
+TEST(VeltSignJni, LibraryOfEachAbiIsFoundOnlyInItsDirectory) {
   EXPECT_TRUE(IsFoundAt("lib/armeabi-v7a/libfoo.so", "lib/arm/libfoo.so"));
   EXPECT_TRUE(IsFoundAt("lib/armeabi-v8a/libfoo.so", "lib/arm64/libfoo.so"));
   EXPECT_TRUE(IsFoundAt("lib/arm64-v8a/libfoo.so", "lib/arm64/libfoo.so"));
@@ -250,14 +250,14 @@ TEST(VeltSignJni, EveryRowOfTheDirectoryTableIsFoundInItsDirectoryAndNowhereElse
   EXPECT_FALSE(IsFoundAt("lib/armeabi/libfoo.so", "lib/armeabi/libfoo.so"));
 }
 
-TEST(VeltSignJni, TheDirectoryTableComparesPlainPrefixes) {
+TEST(VeltSignJni, AbiDirectoriesAreComparedAsPlainPrefixes) {
   EXPECT_TRUE(IsFoundAt("lib/armeabi-v7aX/libfoo.so", "lib/armX/libfoo.so"));
   EXPECT_TRUE(IsFoundAt("lib/armeabi-v9a/libfoo.so", "lib/arm-v9a/libfoo.so"));
   EXPECT_TRUE(IsFoundAt("lib/arm64-v8a.so", "lib/arm64.so"));
   EXPECT_FALSE(IsFoundAt("lib/arm64-v8/libfoo.so", "lib/arm64/libfoo.so"));
 }
 
-TEST(VeltSignJni, TwoAbisOfOneDirectoryAreBothSigned) {
+TEST(VeltSignJni, LibrariesOfTwoAbisInOneDirectoryAreBothSigned) {
   const ZipItem first = Library("lib/armeabi-v7a/libfoo.so");
   const ZipItem second = Library("lib/armeabi/libbar.so");
   PackageOnPhone file(MakePackage(WithLibraries({first, second})));
@@ -268,7 +268,7 @@ TEST(VeltSignJni, TwoAbisOfOneDirectoryAreBothSigned) {
   EXPECT_EQ(file.phone.events, Events({kSelf, event, kSelf, event}));
 }
 
-TEST(VeltSignJni, APackagePathWithoutASlashLooksInTheWorkingDirectory) {
+TEST(VeltSignJni, PackagePathWithoutASlashMeansTheWorkingDirectory) {
   const ZipItem library = Library("lib/armeabi-v7a/libfoo.so");
   TempDir temp;
   const MemoryFile archive(MakePackage(WithLibraries({library})).Build());
@@ -287,7 +287,7 @@ TEST(VeltSignJni, APackagePathWithoutASlashLooksInTheWorkingDirectory) {
             Error("VeltSignJni: File not verified: lib/arm/libfoo.so\n"));
 }
 
-TEST(VeltSignJni, APackageThatDidNotVerifySignsNoLibrary) {
+TEST(VeltSignJni, SignsNoLibraryOfABadPackage) {
   PackageOnPhone file(BadPackage());
   file.Install("lib/arm64/libfoo.so", {"", ToBytes("\177ELF foo")});
   EXPECT_EQ(file.SignJni(), kVeltFailure);
@@ -297,7 +297,7 @@ TEST(VeltSignJni, APackageThatDidNotVerifySignsNoLibrary) {
       Records({Starts(file.fd()), Error("VeltSignJni: malformed apk: " + file.path() + "\n")}));
 }
 
-TEST(VeltSignJni, ALibraryWhoseBytesDifferIsNotSignedAndTheOthersAre) {
+TEST(VeltSignJni, ChangedLibraryIsNotSignedButTheOtherIs) {
   const ZipItem good = Library("lib/arm64-v8a/liba.so");
   const ZipItem bad = Library("lib/arm64-v8a/libb.so");
   PackageOnPhone file(MakePackage(WithLibraries({good, bad})));
@@ -314,7 +314,7 @@ TEST(VeltSignJni, ALibraryWhoseBytesDifferIsNotSignedAndTheOthersAre) {
               records == Records({Starts(file.fd()), refused, signs, Finished()}));
 }
 
-TEST(VeltSignJni, ALibraryThatIsNotOnDiskIsReportedTwice) {
+TEST(VeltSignJni, LibraryThatIsNotOnDiskIsReportedTwice) {
   PackageOnPhone file(MakePackage(WithLibraries({Library("lib/arm64-v8a/libfoo.so")})));
   EXPECT_EQ(file.SignJni(), 0U);
   const std::string target = file.Path("lib/arm64/libfoo.so");
@@ -324,7 +324,7 @@ TEST(VeltSignJni, ALibraryThatIsNotOnDiskIsReportedTwice) {
                      Error("VeltSignJni: File not verified: " + target + "\n"), Finished()}));
 }
 
-TEST(VeltSignJni, ALibraryThatTheManifestDoesNotListIsNotSigned) {
+TEST(VeltSignJni, LibraryThatTheManifestDoesNotListIsNotSigned) {
   Package package = MakePackage(WithLibraries({}));
   const ZipItem library = Library("lib/arm64-v8a/libfoo.so");
   package.items.push_back(library);
@@ -340,7 +340,7 @@ TEST(VeltSignJni, ALibraryThatTheManifestDoesNotListIsNotSigned) {
                Finished()}));
 }
 
-TEST(VeltSignJni, ARefusalOfTheKernelDoesNotChangeTheResult) {
+TEST(VeltSignJni, RefusalByTheKernelDoesNotChangeTheResult) {
   const ZipItem library = Library("lib/arm64-v8a/libfoo.so");
   PackageOnPhone file(MakePackage(WithLibraries({library})));
   file.Install("lib/arm64/libfoo.so", library);
@@ -353,7 +353,7 @@ TEST(VeltSignJni, ARefusalOfTheKernelDoesNotChangeTheResult) {
 }
 
 // The file vanishes between the check and the opening: only the open for the check succeeds.
-TEST(VeltSignJni, ALibraryThatCannotBeOpenedAfterItsCheckIsReportedWithItsErrno) {
+TEST(VeltSignJni, LibraryThatVanishesAfterItsCheckIsReportedWithItsErrno) {
   const ZipItem library = Library("lib/arm64-v8a/libfoo.so");
   PackageOnPhone file(MakePackage(WithLibraries({library})));
   file.Install("lib/arm64/libfoo.so", library);

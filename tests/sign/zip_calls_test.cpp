@@ -77,26 +77,26 @@ void WrapEndIteration(void* cookie) {
 
 namespace {
 
-class ZipCallsTest : public testing::Test {
+class ZipLibraryCalls : public testing::Test {
  protected:
-  ZipCallsTest() { calls = {}; }
+  ZipLibraryCalls() { calls = {}; }
   LogCapture log_;
   Phone phone_;
 };
 
-TEST_F(ZipCallsTest, ADescriptorThatWasGivenStaysTheCallers) {
+TEST_F(ZipLibraryCalls, CallersDescriptorIsNotOwnedByTheArchive) {
   OpenPackage open{PackageOptions()};
   EXPECT_EQ(calls.ownership, std::vector<bool>({false}));
 }
 
-TEST_F(ZipCallsTest, ADescriptorThatInitOpenedIsTheArchives) {
+TEST_F(ZipLibraryCalls, DescriptorThatInitOpenedIsOwnedByTheArchive) {
   const DiskFile file(MakePackage().Build());
   Apk apk(-1);
   apk.Init(-1, file.path().c_str());
   EXPECT_EQ(calls.ownership, std::vector<bool>({true}));
 }
 
-TEST_F(ZipCallsTest, ADescriptorWithAPathStaysTheCallers) {
+TEST_F(ZipLibraryCalls, CallersDescriptorWithAPathIsNotOwnedByTheArchive) {
   const DiskFile file(MakePackage().Build());
   const MemoryFile memory(MakePackage().Build());
   Apk apk(-1);
@@ -104,21 +104,21 @@ TEST_F(ZipCallsTest, ADescriptorWithAPathStaysTheCallers) {
   EXPECT_EQ(calls.ownership, std::vector<bool>({false}));
 }
 
-TEST_F(ZipCallsTest, AFailedOpeningLeavesNoArchive) {
+TEST_F(ZipLibraryCalls, FailedOpeningLeavesNoArchive) {
   OpenPackage open(ToBytes("This is not a zip archive, but a text."));
   void* cookie = nullptr;
   EXPECT_NE(open.apk.StartIteration(&cookie, "", ""), 0);
   EXPECT_EQ(calls.archives, std::vector<void*>({nullptr}));
 }
 
-TEST_F(ZipCallsTest, TheSignatureFileAndTheLibrariesAreWalkedToAndTheWalksEnded) {
+TEST_F(ZipLibraryCalls, EachIterationHasItsFilterAndIsEnded) {
   OpenPackage open(WithLibraries({{"lib/arm64-v8a/libfoo.so", ToBytes("foo")}}));
   VeltSignJni(open.apk, open.file.fd(), "not used");
   EXPECT_EQ(calls.filters, std::vector<std::string>({"META-INF/ .SF", "lib/ .so"}));
   EXPECT_EQ(calls.open_cookies, std::vector<void*>());
 }
 
-TEST_F(ZipCallsTest, WithoutAWalkNoLibraryIsSignedAndTheResultIsTheSame) {
+TEST_F(ZipLibraryCalls, LibrariesAreSkippedWithResultZeroIfIterationFails) {
   OpenPackage open(WithLibraries({{"lib/arm64-v8a/libfoo.so", ToBytes("foo")}}));
   calls.no_iteration = true;
   log_.Clear();
@@ -129,7 +129,7 @@ TEST_F(ZipCallsTest, WithoutAWalkNoLibraryIsSignedAndTheResultIsTheSame) {
   EXPECT_EQ(calls.filters.back(), "lib/ .so");
 }
 
-TEST_F(ZipCallsTest, WithoutAWalkNoSignatureFileIsFound) {
+TEST_F(ZipLibraryCalls, SignatureFileIsNotFoundIfIterationFails) {
   const Package package = MakePackage();
   calls.no_iteration = true;
   OpenPackage open(package);
@@ -138,7 +138,7 @@ TEST_F(ZipCallsTest, WithoutAWalkNoSignatureFileIsFound) {
   EXPECT_EQ(log_.records(), Records());
 }
 
-TEST_F(ZipCallsTest, AWalkThatFindsNothingIsEndedToo) {
+TEST_F(ZipLibraryCalls, IterationThatFindsNothingIsEndedToo) {
   Package package = MakePackage();
   package.Remove("META-INF/CERT.SF");
   OpenPackage open(package);

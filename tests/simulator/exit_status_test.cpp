@@ -9,7 +9,7 @@
 #include "simulator/simulated.h"
 #include "support/package.h"
 
-TEST(ExitStatus, ZeroWhenAllWasSigned) {
+TEST(ExitStatus, IsZeroWhenAllWasSigned) {
   const Probe probe({"sign 3 0100ab"});
   const ProcessResult result = Simulated({probe.path()});
   EXPECT_EQ(result.status, 0);
@@ -17,7 +17,7 @@ TEST(ExitStatus, ZeroWhenAllWasSigned) {
   EXPECT_EQ(LinesOf(result.output)[0], "SIGNED  " + probe.path());
 }
 
-TEST(ExitStatus, OneWhenSomethingWasRefused) {
+TEST(ExitStatus, IsOneWhenTheFileWasRefused) {
   const Probe probe({"log 6 ApkToolkit 61", "log 6 ApkToolkit 62"});
   const ProcessResult result = Simulated({probe.path()});
   EXPECT_EQ(result.status, 1);
@@ -26,20 +26,20 @@ TEST(ExitStatus, OneWhenSomethingWasRefused) {
                                           "  ✗ package  not signed: it logged an error: a|5"}));
 }
 
-TEST(ExitStatus, OneWhenTheToolWasKilled) {
+TEST(ExitStatus, IsOneWhenTheToolWasKilled) {
   const Probe probe({"sign 3 0100ab", "kill 9"});
   const ProbeRun run = probe.Run();
   EXPECT_EQ(run.status, 1);
   EXPECT_EQ(run.events.back(), Json({{"event", "exit"}, {"signal", 9}}));
 }
 
-TEST(ExitStatus, OneWhenTheToolFailed) {
+TEST(ExitStatus, IsOneWhenTheToolFailed) {
   const ProbeRun run = Probe({"sign 3 0100ab", "exit 3"}).Run();
   EXPECT_EQ(run.status, 1);
   EXPECT_EQ(run.events.back(), Json({{"event", "exit"}, {"status", 3}}));
 }
 
-TEST(ExitStatus, FourForAFileThatIsNotThere) {
+TEST(ExitStatus, IsFourForAMissingFile) {
   const ProcessResult result = Told({"/nowhere/base.apk"});
   EXPECT_EQ(result.status, 4);
   EXPECT_EQ(result.output,
@@ -50,7 +50,7 @@ TEST(ExitStatus, FourForAFileThatIsNotThere) {
             "   1  exit       status 0\n");
 }
 
-TEST(ExitStatus, FourWhenStandardInputIsClosed) {
+TEST(ExitStatus, IsFourWhenStandardInputIsClosed) {
   const TempDir directory;
   const std::string file = directory.Write("note.txt", ToBytes("hello\n"));
   const ProcessResult result =
@@ -60,7 +60,7 @@ TEST(ExitStatus, FourWhenStandardInputIsClosed) {
 }
 
 // The probe ignores SIGTERM (15), so the simulator must kill it.
-TEST(ExitStatus, ThreeWhenTheToolDoesNotEnd) {
+TEST(ExitStatus, IsThreeWhenTheToolDoesNotEnd) {
   const Probe probe({"sign 3 0100ab", "ignore 15", "sleep 60"});
   const auto start = std::chrono::steady_clock::now();
   const ProbeRun run = probe.Run({"--timeout", "3"});
@@ -74,7 +74,7 @@ TEST(ExitStatus, ThreeWhenTheToolDoesNotEnd) {
       "apktoolkit-sim: " + probe.path() + ": it was still busy after 1 second and was stopped\n");
 }
 
-TEST(ExitStatus, ThreeWhenTheVerifierDoesNotEnd) {
+TEST(ExitStatus, IsThreeWhenTheVerifierDoesNotEnd) {
   const Probe probe({"sleep 60"});
   const ProcessResult result = Simulated({"--verify", "--timeout", "1", probe.path()});
   EXPECT_EQ(result.output, "");
@@ -85,7 +85,7 @@ TEST(ExitStatus, ThreeWhenTheVerifierDoesNotEnd) {
 
 // Reading a pipe waits for a writer, and a device has no end. Even with --state, the simulator
 // reads neither of them.
-TEST(ExitStatus, OneForADeviceOrAPipe) {
+TEST(ExitStatus, IsOneForADeviceOrAPipe) {
   const TempDir directory;
   const std::string pipe = directory / "pipe";
   ASSERT_EQ(mkfifo(pipe.c_str(), 0600), 0);
@@ -100,7 +100,7 @@ TEST(ExitStatus, OneForADeviceOrAPipe) {
   }
 }
 
-TEST(ExitStatus, ThreeWhenTheToolIsAnotherProgramThatDoesNothing) {
+TEST(ExitStatus, IsThreeWhenTheToolDoesNothing) {
   const Probe probe({});
   const ProcessResult result = Simulated({probe.path()});
   EXPECT_EQ(result.status, 3);
@@ -116,7 +116,7 @@ TEST(ExitStatus, ThreeWhenTheToolIsAnotherProgramThatDoesNothing) {
                    "      Check --tool: apktoolkit ends with 0 for every file."}));
 }
 
-TEST(ExitStatus, ThreeWhenStandardOutputIsFullOrClosed) {
+TEST(ExitStatus, IsThreeWhenStandardOutputIsFullOrClosed) {
   const Probe probe({"sign 3 0100ab"});
   for (const char* script : {"exec \"$@\" >/dev/full", "exec \"$@\" >&-"}) {
     for (const std::string& word :
@@ -128,13 +128,13 @@ TEST(ExitStatus, ThreeWhenStandardOutputIsFullOrClosed) {
   }
 }
 
-TEST(ExitStatus, ThreeWhenThereIsNoTool) {
+TEST(ExitStatus, IsThreeWhenTheToolIsMissing) {
   const ProcessResult result = RunProcess({SimulatorPath(), "--tool", "/nowhere/tool", "/"});
   EXPECT_EQ(result.status, 3);
   EXPECT_EQ(result.errors, "apktoolkit-sim: cannot run /nowhere/tool: No such file or directory\n");
 }
 
-TEST(ExitStatus, ThreeWhenTheToolIsNoProgram) {
+TEST(ExitStatus, IsThreeWhenTheToolIsNotAProgram) {
   if (AreProgramsEmulated()) GTEST_SKIP() << "the emulator starts, and not the tool";
   const TempDir directory;
   const std::string tool = directory.WriteProgram("tool", "\177ELF");
@@ -143,7 +143,7 @@ TEST(ExitStatus, ThreeWhenTheToolIsNoProgram) {
   EXPECT_EQ(result.errors, "apktoolkit-sim: /: cannot start " + tool + ": Exec format error\n");
 }
 
-TEST(ExitStatus, ThreeWhenTheStandInsAreNotInTheTool) {
+TEST(ExitStatus, IsThreeWhenRunnerIsMissingOrStandInsAreNotLoaded) {
   if (AreProgramsEmulated()) GTEST_SKIP() << "the emulator hides that a program does not start";
   const TempDir directory;
   // This tool is a script that starts `true` without LD_PRELOAD, so the stand-ins are not loaded.
@@ -159,7 +159,7 @@ TEST(ExitStatus, ThreeWhenTheStandInsAreNotInTheTool) {
   EXPECT_EQ(runner.errors, "apktoolkit-sim: /: the stand-ins were not loaded into " + tool + "\n");
 }
 
-TEST(ExitStatus, ThreeWhenTheJournalCannotBeWritten) {
+TEST(ExitStatus, IsThreeWhenTheJournalCannotBeWritten) {
   const ProcessResult result = Simulated({"--journal", "/nowhere/journal", "/"});
   EXPECT_EQ(result.status, 3);
   EXPECT_EQ(result.errors,
@@ -167,7 +167,7 @@ TEST(ExitStatus, ThreeWhenTheJournalCannotBeWritten) {
             "or directory\n");
 }
 
-TEST(ExitStatus, ThreeWhenTheJournalIsFull) {
+TEST(ExitStatus, IsThreeWhenTheJournalIsFull) {
   const Probe probe({"sign 3 0100ab"});
   const ProcessResult result = Simulated({"--journal", "/dev/full", probe.path()});
   EXPECT_EQ(result.status, 3);
@@ -176,7 +176,7 @@ TEST(ExitStatus, ThreeWhenTheJournalIsFull) {
   EXPECT_EQ(result.errors.rfind(message, 0), 0U) << result.errors;
 }
 
-TEST(ExitStatus, ThreeWhenThePageCannotBeWritten) {
+TEST(ExitStatus, IsThreeWhenThePageCannotBeWritten) {
   const Probe probe({"sign 3 0100ab"});
   const ProcessResult nowhere = Simulated({"--html", "/nowhere/page", probe.path()});
   EXPECT_EQ(nowhere.status, 3);
@@ -192,7 +192,7 @@ TEST(ExitStatus, ThreeWhenThePageCannotBeWritten) {
 
 // The run fails if nobody reads the pipe. It does not fail if a reader opens the pipe a little
 // late.
-TEST(ExitStatus, ThreeWhenThePageIsAPipeThatNobodyReads) {
+TEST(ExitStatus, IsThreeWhenThePageIsAPipeThatNobodyReads) {
   const Probe probe({"sign 3 0100ab"});
   const std::string pipe = probe.directory() / "page";
   ASSERT_EQ(mkfifo(pipe.c_str(), 0600), 0);
@@ -208,7 +208,7 @@ TEST(ExitStatus, ThreeWhenThePageIsAPipeThatNobodyReads) {
 
 // The fault is in the file system and not in the package, so the run reports nothing about the
 // package.
-TEST(ExitStatus, ThreeWhenLibrariesCannotBeWritten) {
+TEST(ExitStatus, IsThreeWhenLibrariesCannotBeWritten) {
   const TempDir directory;
   const std::string file = directory / "base.apk";
   MakePackage(WithLibraries({{"lib/arm64-v8a/liba.so", Bytes(3000, 'a')}})).WriteTo(file);
@@ -223,7 +223,7 @@ TEST(ExitStatus, ThreeWhenLibrariesCannotBeWritten) {
   EXPECT_NE(result.errors.find(" <install>/lib/arm64/liba.so: File too large"), std::string::npos);
 }
 
-TEST(ExitStatus, OneWhenALibraryCannotBeExtracted) {
+TEST(ExitStatus, IsOneWhenALibraryCannotBeExtracted) {
   Package package = MakePackage();
   package.Item("lib/arm64-v8a/libfoo.so").method = 12;
   const TempDir directory;
@@ -238,13 +238,13 @@ TEST(ExitStatus, OneWhenALibraryCannotBeExtracted) {
             std::string::npos);
 }
 
-TEST(ExitStatus, ThreeWhenTheStateCannotBeKept) {
+TEST(ExitStatus, IsThreeWhenTheStateDirectoryCannotBeUsed) {
   const ProcessResult result = Simulated({"--state", "/dev/null", "/"});
   EXPECT_EQ(result.status, 3);
   EXPECT_EQ(result.errors, "apktoolkit-sim: cannot use the directory /dev/null\n");
 }
 
-TEST(ExitStatus, TwoWhenTheJournalWouldReplaceAFile) {
+TEST(ExitStatus, IsTwoWhenTheJournalWouldReplaceAnInput) {
   const Probe probe({"sign 3 0000"});
   const std::string before = ContentOf(probe.path());
   const ProcessResult result = Simulated({"--journal", probe.path(), probe.path()});
@@ -255,7 +255,7 @@ TEST(ExitStatus, TwoWhenTheJournalWouldReplaceAFile) {
   EXPECT_EQ(ContentOf(probe.path()), before);
 }
 
-TEST(ExitStatus, TwoWhenThePageWouldReplaceAFile) {
+TEST(ExitStatus, IsTwoWhenThePageWouldReplaceAFile) {
   const Probe probe({"sign 3 0000"});
   const std::string notes = probe.directory().Write("notes.html", ToBytes("<!DOCTYPE html>\n<p>"));
   for (const std::string& victim : {probe.path(), notes}) {
@@ -271,7 +271,7 @@ TEST(ExitStatus, TwoWhenThePageWouldReplaceAFile) {
   }
 }
 
-TEST(ExitStatus, TwoWhenATrustedFileOrTheToolWouldBeReplaced) {
+TEST(ExitStatus, IsTwoWhenATrustedFileOrTheToolWouldBeReplaced) {
   const TempDir directory;
   const Probe probe({"sign 3 0000"});
   // Each file begins like the output that would replace it. It is protected only because the run
@@ -293,7 +293,7 @@ TEST(ExitStatus, TwoWhenATrustedFileOrTheToolWouldBeReplaced) {
             "apktoolkit-sim: --journal " + journal + end);
 }
 
-TEST(ExitStatus, TwoWhenPageAndJournalAreOneFile) {
+TEST(ExitStatus, IsTwoWhenPageAndJournalAreOneFile) {
   const Probe probe({"sign 3 0000"});
   const std::string file = probe.directory() / "file";
   const ProcessResult result = Simulated({"--html", file, "--journal", file, probe.path()});
@@ -302,7 +302,7 @@ TEST(ExitStatus, TwoWhenPageAndJournalAreOneFile) {
   EXPECT_EQ(access(file.c_str(), F_OK), -1);
 }
 
-TEST(ExitStatus, TwoWhenAReportWouldReplaceAFile) {
+TEST(ExitStatus, IsTwoWhenAReportWouldReplaceAFile) {
   const Probe probe({"sign 3 0000"});
   const std::string other =
       probe.directory().Write("other", ToBytes("<?xml version=\"1.0\"?>\n{}"));
@@ -323,7 +323,7 @@ TEST(ExitStatus, TwoWhenAReportWouldReplaceAFile) {
   }
 }
 
-TEST(ExitStatus, TwoWhenTwoOutputsAreOneFile) {
+TEST(ExitStatus, IsTwoWhenTwoOutputsAreOneFile) {
   const Probe probe({"sign 3 0000"});
   const std::string file = probe.directory() / "file";
   const Lines options = {"--journal", "--html", "--junit", "--sarif"};
@@ -340,7 +340,7 @@ TEST(ExitStatus, TwoWhenTwoOutputsAreOneFile) {
 
 // In one file, an output and the printed lines would overwrite each other. In a pipe, they follow
 // each other.
-TEST(ExitStatus, TwoWhenAnOutputIsAlsoStandardOutput) {
+TEST(ExitStatus, IsTwoWhenAnOutputIsAlsoAStandardStream) {
   const Probe probe({"sign 3 0000"});
   const auto told = [&probe](const std::string& rest) {
     return RunProcess({"bash", "-c",
@@ -357,7 +357,7 @@ TEST(ExitStatus, TwoWhenAnOutputIsAlsoStandardOutput) {
 }
 
 // If one output cannot be opened, the others must not look like those of a good run.
-TEST(ExitStatus, ThreeInEachReportWhenOneOutputCannotBeOpened) {
+TEST(ExitStatus, IsThreeAndReportsShowItWhenAnOutputCannotBeOpened) {
   const Probe probe({"sign 3 0000"});
   const std::string directory = probe.directory().path();
   const std::string junit = directory + "/j.xml", sarif = directory + "/s.sarif",
@@ -378,7 +378,7 @@ TEST(ExitStatus, ThreeInEachReportWhenOneOutputCannotBeOpened) {
 
 // There is one message for the journal, and not one for each of the three files. The SARIF log also
 // says that the run failed.
-TEST(ExitStatus, ThreeOnceWhenTheDiskIsFull) {
+TEST(ExitStatus, IsThreeWithOneMessageWhenTheDiskIsFull) {
   const Probe probe({"sign 3 0000"});
   const std::string sarif = probe.directory() / "s.sarif";
   const ProcessResult result = Simulated({"--quiet", "--journal", "/dev/full", "--sarif", sarif,
@@ -391,7 +391,7 @@ TEST(ExitStatus, ThreeOnceWhenTheDiskIsFull) {
   EXPECT_EQ(invocation["toolExecutionNotifications"].size(), 1U);
 }
 
-TEST(ExitStatus, ThreeWhenAReportCannotBeWritten) {
+TEST(ExitStatus, IsThreeWhenAReportCannotBeWritten) {
   const Probe probe({"sign 3 0100ab"});
   const ProcessResult junit = Simulated({"--quiet", "--junit", "/dev/full", probe.path()});
   EXPECT_EQ(junit.status, 3);

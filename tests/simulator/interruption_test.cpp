@@ -68,7 +68,7 @@ TEST(Interruption, EndsTheToolAndTheSimulatorByTheSignal) {
 }
 
 // The keyboard signals the tool as well. The tool then ends, but not because of the file.
-TEST(Interruption, OfTheWholeProcessGroupIsNoRefusal) {
+TEST(Interruption, SignalToTheProcessGroupIsNotARefusal) {
   const Probe slow({"sign 3 0000", "pid", "sleep 60"});
   const std::string sarif = slow.directory() / "log.sarif";
   const Interrupted run(
@@ -83,7 +83,7 @@ TEST(Interruption, OfTheWholeProcessGroupIsNoRefusal) {
 
 // When the signal comes, the tool has already ended. The installer's verifier (here the script
 // "java") is still busy. Without its answer there is no result.
-TEST(Interruption, WhileTheInstallerIsAskedIsNoAnswerOfTheInstaller) {
+TEST(Interruption, EndsTheInstallersVerifierWithoutAResult) {
   const TempDir directory;
   const std::string file = directory / "base.apk", pid = directory / "pid";
   MakePackage().WriteTo(file);
@@ -97,7 +97,7 @@ TEST(Interruption, WhileTheInstallerIsAskedIsNoAnswerOfTheInstaller) {
 
 // The reader takes one byte and ends. By then the simulator is writing the libraries of the large
 // packages to temporary directories.
-TEST(Interruption, ByAReaderThatEndsLeavesNothingBehind) {
+TEST(Interruption, EndOfTheReaderLeavesNoTemporaryFiles) {
   const TempDir directory, temporary;
   PackageOptions large;
   large.entries.push_back({"lib/arm64-v8a/liba.so", Bytes(8 << 20, 'a')});
@@ -125,7 +125,7 @@ TEST(Interruption, ByAReaderThatEndsLeavesNothingBehind) {
 
 // The simulator continues after a signal that its caller ignores. For example, nohup starts
 // programs that ignore SIGHUP.
-TEST(Interruption, IsNoneByASignalThatTheCallerIgnores) {
+TEST(Interruption, SignalThatTheCallerIgnoresDoesNotEndTheRun) {
   const Probe slow({"sign 3 0000", "pid", "sleep 1"});
   const ProcessResult result = RunProcess(
       {"bash", "-c",
@@ -135,7 +135,7 @@ TEST(Interruption, IsNoneByASignalThatTheCallerIgnores) {
   EXPECT_EQ(result.status, 0);
 }
 
-TEST(Page, OfAnInterruptedRunHasWhatWasDone) {
+TEST(Page, ShowsWhatAnInterruptedRunHasDone) {
   const Probe good({"sign 3 0000"});
   const Probe slow({"sign 3 0000", "pid", "sleep 60"});
   const std::string page = good.directory() / "page.html";
@@ -154,7 +154,7 @@ TEST(Page, OfAnInterruptedRunHasWhatWasDone) {
 
 // Each file has its test case. The interrupted file has an error. The last two files were never
 // begun, and also have an error.
-TEST(Reports, OfAnInterruptedRunAreWholeAndNotGreen) {
+TEST(Reports, AreCompleteAndHaveErrorsAfterAnInterruption) {
   const Probe good({"sign 3 0000"});
   const Probe slow({"sign 3 0000", "pid", "sleep 60"});
   const std::string junit = good.directory() / "junit.xml", sarif = good.directory() / "log.sarif";

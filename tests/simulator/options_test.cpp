@@ -68,14 +68,14 @@ TEST(Options, ZuResultMayBeHexadecimal) {
   EXPECT_EQ(Parsed({"--zu-result", "0x10004", "a.apk"}).run.phone.zu_result, 65540);
 }
 
-TEST(Options, TrustTakesOneFileAtATime) {
+TEST(Options, TrustAcceptsOneFileEachTime) {
   const Options options =
       Parsed({"--trust", "/dev/zero", "--trust", "/dev/null", "a.apk", "b.apk"});
   EXPECT_EQ(options.run.trust, Lines({"/dev/zero", "/dev/null"}));
   EXPECT_EQ(options.files.names, Lines({"a.apk", "b.apk"}));
 }
 
-TEST(Options, TheRestIsTakenAsItIs) {
+TEST(Options, OutputAndToolOptionsSetTheirValues) {
   const Options options =
       Parsed({"--state", "s", "--journal", "j", "--html", "h", "--json", "--tool", "t", "--timeout",
               "0.5", "--runner", "emulator  -L /root", "--", "-a.apk"});
@@ -89,14 +89,14 @@ TEST(Options, TheRestIsTakenAsItIs) {
   EXPECT_EQ(options.files.names, Lines({"-a.apk"}));
 }
 
-TEST(Options, WordsOfTheRunAreTakenAsTheyAre) {
+TEST(Options, QuietVerboseStrictAndJobsSetTheirValues) {
   EXPECT_EQ(Parsed({"--quiet", "a.apk"}).show.detail, Detail::kVerdict);
   EXPECT_EQ(Parsed({"--verbose", "a.apk"}).show.detail, Detail::kAll);
   EXPECT_TRUE(Parsed({"--strict", "a.apk"}).judge.is_strict);
   EXPECT_EQ(Parsed({"--jobs", "8", "a.apk"}).run.jobs, 8U);
 }
 
-TEST(Options, InstallTakesItsValueAfterAnEqualsSignAlone) {
+TEST(Options, InstallReadsItsValueOnlyAfterAnEqualsSign) {
   EXPECT_EQ(Parsed({"--install=all", "a.apk"}).run.abi, InstalledAbi::kAll);
   EXPECT_EQ(Parsed({"--install=arm64", "a.apk"}).run.abi, InstalledAbi::kArm64);
   EXPECT_EQ(Parsed({"--install=arm", "a.apk"}).run.abi, InstalledAbi::kArm);
@@ -124,11 +124,11 @@ TEST(Options, FilesComeFromTheCommandLineOrAList) {
   EXPECT_TRUE(listed.files.is_recursive);
 }
 
-TEST(Options, MissingFileIsTold) {
+TEST(Options, MissingFileArgumentIsReported) {
   EXPECT_EQ(LinesOf(Told({}).errors)[0], "FILE is required, or --files-from");
 }
 
-TEST(Options, InstallerIsAskedWhereItIsThereAboutAllPhonesOfTheTool) {
+TEST(Options, InstallerIsAutoForApi27AndLaterByDefault) {
   const Options options = Parsed({"a.apk"});
   EXPECT_EQ(options.installer.use, InstallerUse::kAuto);
   EXPECT_EQ(options.installer.levels.first, 27);
@@ -141,7 +141,7 @@ TEST(Options, InstallerIsAskedWhereItIsThereAboutAllPhonesOfTheTool) {
   EXPECT_EQ(Parsed({"--timeout", "2", "a.apk"}).installer.timeout, 2);
 }
 
-TEST(Options, ApiLevelsAreOneARangeOrAllFromOneOn) {
+TEST(Options, ApiAcceptsALevelARangeAndAnOpenRange) {
   const auto levels = [](const std::string& text) {
     const LevelRange range = Parsed({"--api", text, "a.apk"}).installer.levels;
     return std::make_pair(range.first, range.last);
@@ -151,7 +151,7 @@ TEST(Options, ApiLevelsAreOneARangeOrAllFromOneOn) {
   EXPECT_EQ(levels("30-"), std::make_pair(30, kNewestLevel));
 }
 
-TEST(Options, SignersAreDigestsInOneForm) {
+TEST(Options, SignerDigestsAreStoredInOneForm) {
   const std::string digest(64, 'a');
   std::string pairs = "AA";
   for (int i = 1; i < 32; ++i) pairs += ":aA";
@@ -161,7 +161,7 @@ TEST(Options, SignersAreDigestsInOneForm) {
   EXPECT_EQ(Parsed({"a.apk"}).gate.signers, Lines());
 }
 
-TEST(Options, OfTheGateAndItsReports) {
+TEST(Options, GateAndReportOptionsSetTheirValues) {
   EXPECT_FALSE(Parsed({"a.apk"}).gate.refuses_warnings);
   EXPECT_TRUE(Parsed({"--werror", "a.apk"}).gate.refuses_warnings);
   const Options options = Parsed({"--junit", "j", "--sarif", "s", "a.apk"});
@@ -179,7 +179,7 @@ TEST(Options, JournalOnStandardOutputIsJson) {
   EXPECT_EQ(file.show.journal, "./-");
 }
 
-TEST(Options, OwnToolIsTheOneBesideTheSimulator) {
+TEST(Options, ToolIsOwnUnlessItIsNamed) {
   EXPECT_TRUE(Parsed({"a.apk"}).run.is_own_tool);
   EXPECT_FALSE(Parsed({"--tool", "t", "a.apk"}).run.is_own_tool);
 }
@@ -242,7 +242,7 @@ TEST(Options, MistakesAreReportedWithStatusTwo) {
   }
 }
 
-TEST(Options, AnUnknownErrorIsNamed) {
+TEST(Options, UnknownErrorNameIsReported) {
   EXPECT_EQ(LinesOf(Told({"--sign-errno", "EWHAT", "a.apk"}).errors)[0],
             "--sign-errno: no error has the name EWHAT");
 }
@@ -258,7 +258,7 @@ TEST(Options, FileThatLooksLikeAnOptionIsNamed) {
             "there is no option -dash.apk; for a file of this name, write ./-dash.apk");
 }
 
-TEST(Options, HelpNamesEveryOptionAndStatus) {
+TEST(Options, HelpNamesOptionsAndEveryStatus) {
   const ProcessResult result = Told({"--help"});
   EXPECT_EQ(result.status, 0);
   EXPECT_EQ(result.errors, "");
@@ -310,7 +310,7 @@ TEST(Options, HelpFitsATerminalAndShowsDefaultsInOneWay) {
   EXPECT_EQ(defaults, 11U);
 }
 
-TEST(Options, VersionIsTheProjects) {
+TEST(Options, VersionIsThatOfTheProject) {
   const ProcessResult result = Told({"--version"});
   EXPECT_EQ(result.status, 0);
   EXPECT_EQ(result.output, "apktoolkit-sim " APKTOOLKIT_VERSION "\n");

@@ -16,7 +16,7 @@ constexpr char kNotTrusted[] =
 
 }  // namespace
 
-TEST(Files, AreSetApartAndSummedUp) {
+TEST(SimulatorOutput, AreSeparatedByAnEmptyLineAndSummedUp) {
   const Probe good({"sign 3 0000"});
   const Probe bad({"verify 3"});
   const ProcessResult result = Simulated({good.path(), bad.path(), good.path()});
@@ -26,7 +26,7 @@ TEST(Files, AreSetApartAndSummedUp) {
   EXPECT_EQ(LinesOf(result.output).back(), "3 files: 2 trusted JARs, 1 JAR not trusted");
 }
 
-TEST(Files, AreVerdictsAloneWhenAsked) {
+TEST(SimulatorOutput, ShowOnlyTheVerdictLinesWithQuiet) {
   const Probe good({"sign 3 0000"});
   const Probe bad({"verify 3"});
   EXPECT_EQ(
@@ -35,7 +35,7 @@ TEST(Files, AreVerdictsAloneWhenAsked) {
 }
 
 // The first file takes longest, but the output keeps the order of the command line.
-TEST(Files, KeepTheirOrderWhenSeveralRunAtATime) {
+TEST(SimulatorOutput, KeepTheirOrderWhenSeveralRunAtATime) {
   const Probe slow({"sign 3 0000", "sleep 1"});
   const Probe quick({"verify 3"});
   const Lines files = {slow.path(), quick.path(), quick.path(), quick.path()};
@@ -60,13 +60,13 @@ TEST(Files, KeepTheirOrderWhenSeveralRunAtATime) {
 }
 
 // A progress line is overwritten later, so a pipe gets none.
-TEST(Files, ShowNoProgressWithoutATerminal) {
+TEST(SimulatorOutput, ShowNoProgressWithoutATerminal) {
   const Probe slow({"sign 3 0000", "sleep 2"});
   EXPECT_EQ(Simulated({slow.path()}).errors, "");
 }
 
 // The program "script" of util-linux gives the simulator a terminal.
-TEST(Files, ShowProgressOnATerminalWhenItTakesLonger) {
+TEST(SimulatorOutput, ShowProgressOnATerminalWhenItTakesLonger) {
   if (RunProcess({"script", "-qec", "true", "/dev/null"}).status != 0) {
     GTEST_SKIP() << "there are no pseudo-terminals here: /dev/pts is not mounted";
   }
@@ -82,7 +82,7 @@ TEST(Files, ShowProgressOnATerminalWhenItTakesLonger) {
 }
 
 // https://no-color.org
-TEST(Files, HaveNoColoursWhereTheUserWantsNone) {
+TEST(SimulatorOutput, VariableNoColorTurnsColoursOff) {
   if (RunProcess({"script", "-qec", "true", "/dev/null"}).status != 0) {
     GTEST_SKIP() << "there are no pseudo-terminals here: /dev/pts is not mounted";
   }
@@ -97,7 +97,7 @@ TEST(Files, HaveNoColoursWhereTheUserWantsNone) {
 }
 
 // The name of a file may contain control sequences for the terminal.
-TEST(Files, NamesReachNoTerminalAsTheyAre) {
+TEST(SimulatorOutput, ControlSequencesInNamesAreEscaped) {
   const TempDir directory;
   const std::string odd = directory.Write("-\x1b]0;x\x07", ToBytes("sign 3 0000\n"));
   for (const Lines& words :
@@ -123,7 +123,7 @@ TEST(Journal, StartsWithTheVersionTheFileAndTheProcess) {
   EXPECT_EQ(events[5]["event"], "verdict");
 }
 
-TEST(Journal, IsKeptInAFileAnew) {
+TEST(Journal, ReplacesTheFileOfAnEarlierRun) {
   const Probe probe({"sign 3 0000"});
   const std::string before = "{\"event\":\"journal\",\"version\":1}\n{\"event\":\"old\"}\n";
   const std::string file = probe.directory().Write("journal", ToBytes(before));
@@ -134,7 +134,7 @@ TEST(Journal, IsKeptInAFileAnew) {
   EXPECT_EQ(ParseJournal(both.output).size(), 6U);
 }
 
-TEST(Journal, FileNamesAreBytes) {
+TEST(Journal, InvalidUtf8InFileNamesIsKept) {
   const TempDir directory;
   const std::string odd = directory.Write("od\xe9\n\"d", ToBytes("sign 3 0000\n"));
   const ProcessResult result = Simulated({"--json", odd});
@@ -172,7 +172,7 @@ TEST(Journal, HasNoHiddenCharacters) {
 }
 
 // An earlier green report must not outlive a run that could not begin.
-TEST(Reports, OfARunThatCannotBeginAreNotGreen) {
+TEST(Reports, ShowAnErrorIfTheRunCannotBegin) {
   const Probe good({"sign 3 0000"});
   const std::string junit = good.directory() / "junit.xml", sarif = good.directory() / "log.sarif";
   const Lines reports = {"--junit", junit, "--sarif", sarif, good.path()};
@@ -200,7 +200,7 @@ TEST(Simulation, FollowsLinksToTheFile) {
   EXPECT_EQ(Simulated({link}).status, 0);
 }
 
-TEST(Simulation, WorksFromADirectoryThatTheLoaderCannotName) {
+TEST(Simulation, WorksFromADirectoryWithASpaceAndAColon) {
   if (AreProgramsEmulated()) GTEST_SKIP() << "the copies cannot be started by themselves";
   namespace fs = std::filesystem;
   const TempDir directory;
@@ -242,7 +242,7 @@ TEST(Simulation, HasNoResultForAFileThatWasChangedMeanwhile) {
 }
 
 // Each run makes and removes a hard link to the file, for its own installation.
-TEST(Simulation, RunsOverOneFileAtTheSameTimeDoNotDisturbEachOther) {
+TEST(Simulation, ParallelRunsOverOneFileDoNotDisturbEachOther) {
   const TempDir directory;
   PackageOptions options;
   options.entries.push_back({"lib/arm64-v8a/liba.so", ToBytes("a")});
@@ -296,7 +296,7 @@ TEST(Simulation, RunnerGetsThePreloadForTheTool) {
   EXPECT_EQ(result.status, 0);
 }
 
-TEST(Simulation, HandsNoOpenFileOfTheCallersToTheTool) {
+TEST(Simulation, DoesNotPassTheCallersOpenFilesToTheTool) {
   const Probe probe({"sign 3 0000"});
   const ProcessResult result =
       RunProcess({"bash", "-c", "exec 3</dev/null 7</dev/null; exec \"$@\"", "bash",
@@ -309,7 +309,7 @@ TEST(Simulation, HandsNoOpenFileOfTheCallersToTheTool) {
   EXPECT_EQ(result.status, 0) << result.errors;
 }
 
-TEST(State, WhatWasSignedStaysTrustedWhileItsBytesStayTheSame) {
+TEST(TrustState, TrustsASignedFileUntilItsBytesChange) {
   const TempDir state;
   const Probe jar({"verify 3", "sign 3 0000"});
   EXPECT_EQ(jar.Run({"--state", state.path()}).status, 1);
@@ -319,14 +319,14 @@ TEST(State, WhatWasSignedStaysTrustedWhileItsBytesStayTheSame) {
   EXPECT_EQ(jar.Run({"--state", state.path()}).results[0], "-1 126");
 }
 
-TEST(State, WhatWasNotSignedIsNotTrusted) {
+TEST(TrustState, DoesNotTrustAFileThatWasNotSigned) {
   const TempDir state;
   const Probe jar({"verify 3", "sign 3 0000"});
   EXPECT_EQ(jar.Run({"--state", state.path(), "--sign-errno", "EPERM"}).status, 1);
   EXPECT_EQ(jar.Run({"--state", state.path()}).results[0], "-1 126");
 }
 
-TEST(State, LastsForTheFilesOfOneRunWithoutADirectory) {
+TEST(TrustState, IsSharedByTheFilesOfARunWithoutADirectory) {
   const Probe jar({"verify 3", "sign 3 0000"});
   const ProcessResult result = Simulated({"--json", jar.path(), jar.path()});
   const std::vector<Json> verified = OfKind(ParseJournal(result.output), "verify");
@@ -336,7 +336,7 @@ TEST(State, LastsForTheFilesOfOneRunWithoutADirectory) {
 }
 
 // The last runs begin after the first ones have ended, but do not know what those signed.
-TEST(State, IsNotSharedWhenSeveralFilesRunAtATime) {
+TEST(TrustState, IsNotSharedWhenSeveralFilesRunAtATime) {
   const Probe jar({"verify 3", "sign 3 0000"});
   const ProcessResult result = Simulated(
       {"--jobs", "2", "--json", jar.path(), jar.path(), jar.path(), jar.path(), jar.path()});
@@ -345,7 +345,7 @@ TEST(State, IsNotSharedWhenSeveralFilesRunAtATime) {
   for (const Json& event : verified) EXPECT_EQ(event["result"], -1);
 }
 
-TEST(Tool, RunsAsItIsOnAFileThatIsNoZip) {
+TEST(RealTool, RunsAsItIsOnAFileThatIsNoZip) {
   const TempDir directory;
   const std::string file = directory.Write("note.txt", ToBytes("hello\n"));
   const ProcessResult result = Told({file});

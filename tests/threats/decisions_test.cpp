@@ -30,7 +30,7 @@ Bytes WithForgedBlock(const Bytes& exponent) {
 // The first four bytes of each exponent are read as 1 or -1. Bytes 5 to 8, if there are any,
 // overwrite the length of the modulus. They are the first bytes of 00 01 00 00, which is 256 in
 // host byte order, so that the length does not change.
-TEST(Threat, AnExponentOfOneIsRefusedInEveryForm) {
+TEST(Threat, ExponentOfOneOrMinusOneIsRefusedInEveryForm) {
   for (const char* exponent :
        {"01", "01 00", "01 00 00", "01 00 00 00", "FF FF FF FF", "01 00 00 00 00 01",
         "01 00 00 00 00 01 00", "01 00 00 00 00 01 00 00", "01 00 00 00 00 01 00 00 AA BB",
@@ -43,7 +43,7 @@ TEST(Threat, AnExponentOfOneIsRefusedInEveryForm) {
 }
 
 // These exponents reach the check of the certificate's signature, which fails.
-TEST(Threat, AnyOtherExponentAsksForThePrivateKey) {
+TEST(Threat, OtherExponentsReachTheCheckOfTheCertificate) {
   for (const char* exponent : {"00", "02", "03", "11", "7F", "01 00 01", "01 01", "00 01", "02 00",
                                "FE FF FF FF", "FF FF FF 7F", "FF FF FF", "FF", "00 00 00 01"}) {
     Device device(WithForgedBlock(FromHex(exponent)));
@@ -55,9 +55,9 @@ TEST(Threat, AnyOtherExponentAsksForThePrivateKey) {
 
 // ---- The file that is signed is the file that was read.
 
-class ExchangedLibrary : public testing::Test {
+class LibraryAfterItsCheck : public testing::Test {
  protected:
-  ExchangedLibrary() : device_(Made("dots")), target_(device_.Path("../mine/libx.so")) {
+  LibraryAfterItsCheck() : device_(Made("dots")), target_(device_.Path("../mine/libx.so")) {
     device_.Install("lib/arm64/x", {}).Install("../mine/libx.so", kMine);
     device_.Install("../system/program", ToBytes("\177ELF system"));
   }
@@ -94,32 +94,32 @@ class ExchangedLibrary : public testing::Test {
   int seen_ = 0;
 };
 
-TEST_F(ExchangedLibrary, ThatStaysUnchangedIsSigned) {
+TEST_F(LibraryAfterItsCheck, IsSignedIfItStaysTheSame) {
   EXPECT_EQ(FilesSigned([] {}), Strings({"mine/libx.so", "app/base.apk"}));
 }
 
-TEST_F(ExchangedLibrary, ForASymbolicLinkToAnotherFileIsRefused) {
+TEST_F(LibraryAfterItsCheck, IsRefusedIfItIsASymbolicLinkToAnotherFile) {
   ExpectRefused([this] {
     Remove();
     EXPECT_EQ(symlink(device_.Path("../system/program").c_str(), target_.c_str()), 0);
   });
 }
 
-TEST_F(ExchangedLibrary, ForAFifoIsRefusedWithoutWaiting) {
+TEST_F(LibraryAfterItsCheck, IsRefusedWithoutWaitingIfItIsAFifo) {
   ExpectRefused([this] {
     Remove();
     EXPECT_EQ(mkfifo(target_.c_str(), 0600), 0);
   });
 }
 
-TEST_F(ExchangedLibrary, ForADirectoryIsRefused) {
+TEST_F(LibraryAfterItsCheck, IsRefusedIfItIsADirectory) {
   ExpectRefused([this] {
     Remove();
     EXPECT_EQ(mkdir(target_.c_str(), 0700), 0);
   });
 }
 
-TEST_F(ExchangedLibrary, ForAnotherFileWithTheSameBytesIsSigned) {
+TEST_F(LibraryAfterItsCheck, IsSignedIfItIsAnotherFileWithTheSameBytes) {
   const Strings files = FilesSigned([this] {
     device_.Install("../mine/other", kMine);
     EXPECT_EQ(rename(device_.Path("../mine/other").c_str(), target_.c_str()), 0);
@@ -127,7 +127,7 @@ TEST_F(ExchangedLibrary, ForAnotherFileWithTheSameBytesIsSigned) {
   EXPECT_EQ(files, Strings({"mine/libx.so", "app/base.apk"}));
 }
 
-TEST_F(ExchangedLibrary, WrittenToIsRefused) {
+TEST_F(LibraryAfterItsCheck, IsRefusedIfItWasWrittenTo) {
   ExpectRefused([this] {
     usleep(20000);  // the clock of file systems is coarse
     WriteFile(target_, ToBytes("\177ELF evil"));
@@ -135,7 +135,7 @@ TEST_F(ExchangedLibrary, WrittenToIsRefused) {
 }
 
 // A program can set a file's atime and mtime, but not its ctime.
-TEST_F(ExchangedLibrary, WrittenToWithItsTimeSetBackIsRefused) {
+TEST_F(LibraryAfterItsCheck, IsRefusedIfItWasWrittenToAndItsTimeSetBack) {
   ExpectRefused([this] {
     struct stat before;
     EXPECT_EQ(stat(target_.c_str(), &before), 0);
@@ -146,11 +146,11 @@ TEST_F(ExchangedLibrary, WrittenToWithItsTimeSetBackIsRefused) {
   });
 }
 
-TEST_F(ExchangedLibrary, LongerIsRefused) {
+TEST_F(LibraryAfterItsCheck, IsRefusedIfItIsLonger) {
   ExpectRefused([this] { WriteFile(target_, ToBytes("\177ELF mine and more")); });
 }
 
-TEST_F(ExchangedLibrary, LeavesNoDescriptorBehind) {
+TEST_F(LibraryAfterItsCheck, LeavesNoDescriptorOpen) {
   const int next = dup(0);
   close(next);
   ExpectRefused([this] {

@@ -21,7 +21,7 @@ bool ParseAtMemoryEnd(ApkTools::Apk* apk, const Bytes& document) {
   return parsed;
 }
 
-TEST(CompiledManifestAtMemoryEnd, IsNotReadBeyondAtAnyLength) {
+TEST(CompiledManifestAtMemoryEnd, IsNotReadBeyondTheBlockAtAnyLength) {
   const Bytes whole = CompiledManifest("com.example.app", true);
   for (size_t size = 0; size <= whole.size(); ++size) {
     LogCapture log;
@@ -39,7 +39,7 @@ void SetSize(Bytes* document, size_t chunk, size_t size) {
 
 // The last node ends `rest` bytes before the end of the document. The parser looks for another
 // header in these bytes.
-TEST(CompiledManifestAtMemoryEnd, IsNotReadBeyondForANodeThatIsNotThere) {
+TEST(CompiledManifestAtMemoryEnd, IsNotReadBeyondTheBlockForAMissingNode) {
   for (uint8_t rest = 1; rest <= 8; ++rest) {
     Bytes document = CompiledManifest("com.example.app", true);
     document.insert(document.end(), rest, 0);
@@ -54,7 +54,7 @@ TEST(CompiledManifestAtMemoryEnd, IsNotReadBeyondForANodeThatIsNotThere) {
 
 // An attribute of size 0 may be at the end of its element. All its fields are then beyond the
 // element.
-TEST(CompiledManifestAtMemoryEnd, IsNotReadBeyondForAnAttributeThatIsNotThere) {
+TEST(CompiledManifestAtMemoryEnd, IsNotReadBeyondTheBlockForAMissingAttribute) {
   constexpr size_t kNode = 36, kAttribute = 20;
   Bytes document =
       CompiledXml()
@@ -70,7 +70,7 @@ TEST(CompiledManifestAtMemoryEnd, IsNotReadBeyondForAnAttributeThatIsNotThere) {
   EXPECT_EQ(apk.GetPackageName(), "p");
 }
 
-TEST(CompiledManifestAtMemoryEnd, WithoutRoomForAHeaderIsRefused) {
+TEST(CompiledManifestAtMemoryEnd, IsRefusedIfShorterThanAHeader) {
   const Bytes whole = CompiledManifest("com.example.app");
   for (int size = 0; size < 8; ++size) {
     ApkTools::Apk apk(-1);
@@ -84,7 +84,7 @@ TEST(CompiledManifestAtMemoryEnd, WithoutRoomForAHeaderIsRefused) {
 }
 
 // The table for sorting has a hash and a number for each section.
-TEST(EntryDigestsAtMemoryEnd, AreSortedWithoutOneMore) {
+TEST(EntryDigestsAtMemoryEnd, AreSortedWithoutAccessBeyondTheTable) {
   constexpr size_t kSections = 33;
   std::string text;
   for (size_t i = kSections; i > 0; --i) {
@@ -124,7 +124,7 @@ TEST(ManifestSectionsAtMemoryEnd, AreNotReadBeyondTheLastAttribute) {
 // Names and values have 1 to 19 bytes, because the parser reads eight bytes at once. The text is
 // cut at each multiple of 4 bytes, because only a block of such a size ends exactly where memory
 // ends.
-TEST(JarManifestAtMemoryEnd, IsNotReadBeyondAtAnyLength) {
+TEST(JarManifestAtMemoryEnd, IsNotReadBeyondTheBlockAtAnyLength) {
   for (size_t length = 1; length < 20; ++length) {
     const std::string run(length, 'v');
     const std::string whole = run + ": " + run + "\r\n " + run + "\r\nKey:\r\n " + run + "\r\n\r\n";

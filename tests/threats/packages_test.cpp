@@ -32,9 +32,9 @@ std::string AllSignedAndRegistered(const std::string& apk, const std::string& ke
 
 // ---- Packages signed by apksigner with each kind of RSA key.
 
-class KeyOfApksigner : public testing::TestWithParam<const char*> {};
+class ApksignerKey : public testing::TestWithParam<const char*> {};
 
-TEST_P(KeyOfApksigner, VerifiesAndIsRegistered) {
+TEST_P(ApksignerKey, VerifiesAndIsRegistered) {
   const std::string apk = Made(std::string("keys/") + GetParam());
   EXPECT_EQ(Simulate(apk).timeline, AllSignedAndRegistered(apk, GetParam(), "com.example.vault"));
 }
@@ -45,7 +45,7 @@ std::string NameOf(const testing::TestParamInfo<const char*>& info) {
   return name;
 }
 
-INSTANTIATE_TEST_SUITE_P(Rsa, KeyOfApksigner,
+INSTANTIATE_TEST_SUITE_P(Rsa, ApksignerKey,
                          testing::Values("rsa-1024", "rsa-1536", "rsa-2048", "rsa-2048-e3",
                                          "rsa-2048-e17", "rsa-2048-other", "rsa-3072", "rsa-4096"),
                          NameOf);
@@ -66,7 +66,7 @@ class ForeignMetaInf : public testing::TestWithParam<const char*> {
   const std::string apk_;
 };
 
-TEST_P(ForeignMetaInf, PassesForTheAttackersPackageFromAndroid7On) {
+TEST_P(ForeignMetaInf, PassesApksignerWithTheAttackersKeyFromAndroid7On) {
   const ProcessResult verdict = RunProcess(
       {"apksigner", "verify", "--verbose", "--print-certs", "--min-sdk-version", "24", apk_});
   EXPECT_EQ(verdict.status, 0) << verdict.output << verdict.errors;

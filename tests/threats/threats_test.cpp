@@ -58,7 +58,7 @@ bool IsVerifiedByOpenssl(Package package) {
              .status == 0;
 }
 
-TEST(Threat, OfTwoSignersTheFirstCertificateAndTheFirstSignatureCount) {
+TEST(Threat, FirstCertificateAndFirstSignatureOfTwoSignersCount) {
   const Strings one = {"rsa-2048", "rsa-2048-other"}, other = {"rsa-2048-other", "rsa-2048"};
   for (const Strings& certificates : {one, other}) {
     for (const Strings& signers : {one, other}) {
@@ -76,7 +76,7 @@ TEST(Threat, OfTwoSignersTheFirstCertificateAndTheFirstSignatureCount) {
 // Four bytes follow the modulus. The exponent's fifth to eighth bytes, 00 01 00 00, are 256 in host
 // byte order. They set the length of the modulus back to 256 bytes. Other readers see a key of 2080
 // bits.
-TEST(Threat, AModulusWithJunkBehindItIsTheKeyThatItStartsWith) {
+TEST(Threat, ModulusWithExtraBytesIsTheKeyThatItStartsWith) {
   Package package = MakePackage();
   Certificate certificate;
   certificate.public_key_info = PublicKeyInfoAround(
@@ -89,7 +89,7 @@ TEST(Threat, AModulusWithJunkBehindItIsTheKeyThatItStartsWith) {
 }
 
 // No verified fact shows that a newer package exists.
-TEST(Threat, AnOlderPackageOfASignerKeepsItsPayload) {
+TEST(Threat, OlderPackageOfASignerKeepsItsPayload) {
   const Package older = MakePackage();
   PackageOptions options;
   options.entries = {{"classes.dex", ToBytes("dex\n035 mended")}};
@@ -106,7 +106,7 @@ PackageOptions WithLibrariesNamed(const Strings& names) {
   return options;
 }
 
-TEST(Threat, DotsInAnEntryNameReachAFileOutsideWhoseBytesTheManifestLists) {
+TEST(Threat, DotsInAnEntryNameSignAFileOutsideWithListedBytes) {
   Device device(MakePackage(WithLibrariesNamed({"lib/arm64-v8a/../../../other/libfoo.so"})));
   device.Install("lib/arm64/x", {}).Install("../other/libfoo.so", kLibrary);
   EXPECT_EQ(device.FilesSignedFor("rsa-2048"), Strings({"other/libfoo.so", "app/base.apk"}));
@@ -135,11 +135,11 @@ void ExpectProgramSigned(const std::function<int(const char* program, const char
   EXPECT_EQ(program.st_ino, signed_file.st_ino);
 }
 
-TEST(Threat, ASymbolicLinkWhereDotsLeadHasAProgramSigned) { ExpectProgramSigned(symlink); }
+TEST(Threat, SymbolicLinkWhereDotsLeadGetsAProgramSigned) { ExpectProgramSigned(symlink); }
 
-TEST(Threat, AHardLinkWhereDotsLeadHasAProgramSigned) { ExpectProgramSigned(link); }
+TEST(Threat, HardLinkWhereDotsLeadGetsAProgramSigned) { ExpectProgramSigned(link); }
 
-TEST(Threat, FileIsReadAndSignedForEachEntryThatNamesIt) {
+TEST(Threat, FileIsSignedForEachEntryThatNamesIt) {
   Device device(MakePackage(WithLibrariesNamed({"lib/arm64-v8a/a.so", "lib/arm64-v8a/./a.so"})));
   device.Install("lib/arm64/a.so", kLibrary);
   EXPECT_EQ(device.FilesSignedFor("rsa-2048"),
@@ -161,7 +161,7 @@ TEST(Threat, PackageNameIsRegisteredUpToItsFirstNul) {
             Strings({"com.example.app " + Hex(ModulusOf("rsa-2048"))}));
 }
 
-TEST(Threat, PackageWhoseAndroidManifestCannotBeExtractedIsAJarThatTheKernelMustTrust) {
+TEST(Threat, PackageWithUnreadableAndroidManifestCountsAsAJar) {
   Package package = MakePackage();
   ZipItem& manifest = package.Item(kAndroidManifestName);
   manifest = ClaimingLength(manifest, static_cast<uint32_t>(manifest.data.size() + 1));
@@ -205,7 +205,7 @@ Strings LibrariesWalked(const Package& package) {
 
 // The zip library compares an entry's two headers when the iteration reaches the entry. If the
 // headers differ, the library ends the iteration there.
-TEST(Threat, ADamagedLibraryEndsTheWalkAndIntactOnesBehindItStayUnsigned) {
+TEST(Threat, DamagedLibraryEndsTheIterationAndLaterOnesStayUnsigned) {
   const Strings names = {"lib/arm64-v8a/liba.so", "lib/arm64-v8a/libb.so", "lib/arm64-v8a/libc.so"};
   const Package intact = MakePackage(WithLibrariesNamed(names));
   const Strings walked = LibrariesWalked(intact);
@@ -253,7 +253,7 @@ void Patch(const std::string& path, size_t position, char byte) {
   close(fd);
 }
 
-TEST(Threat, ALibraryThatIsWrittenToInPlaceAfterItsChecksIsSigned) {
+TEST(Threat, LibraryWrittenToInPlaceAfterItsChecksIsSigned) {
   Device device(MakePackage());
   device.Install("lib/arm64/libfoo.so", kLibrary);
   const std::string library = device.Path("lib/arm64/libfoo.so");
@@ -262,7 +262,7 @@ TEST(Threat, ALibraryThatIsWrittenToInPlaceAfterItsChecksIsSigned) {
 }
 
 // A write through the mapping to a page that is already dirty does not change the file's times.
-TEST(Threat, ALibraryThatIsWrittenToThroughAMappingAfterItWasReadIsSigned) {
+TEST(Threat, LibraryWrittenToThroughAMappingAfterItWasReadIsSigned) {
   Device device(MakePackage());
   device.Install("lib/arm64/libfoo.so", kLibrary);
   const std::string library = device.Path("lib/arm64/libfoo.so");
@@ -283,7 +283,7 @@ TEST(Threat, ALibraryThatIsWrittenToThroughAMappingAfterItWasReadIsSigned) {
   close(fd);
 }
 
-TEST(Threat, APackageThatIsWrittenToInPlaceAfterItsChecksIsSigned) {
+TEST(Threat, PackageWrittenToInPlaceAfterItsChecksIsSigned) {
   PackageOptions options;
   options.entries.push_back({"assets/text", ToBytes("an asset")});
   const Bytes archive = MakePackage(options).Build();
@@ -298,7 +298,7 @@ TEST(Threat, APackageThatIsWrittenToInPlaceAfterItsChecksIsSigned) {
 }
 
 // The write comes after the kernel answers that it trusts the file, and before it signs the file.
-TEST(Threat, AJarThatIsWrittenToInPlaceAfterItWasTrustedIsSigned) {
+TEST(Threat, JarWrittenToInPlaceAfterItWasTrustedIsSigned) {
   const Bytes archive = MakePackage(PlainJar()).Build();
   Device device(archive);
   const std::string jar = device.Path("base.apk");
@@ -308,7 +308,7 @@ TEST(Threat, AJarThatIsWrittenToInPlaceAfterItWasTrustedIsSigned) {
 
 // The zip library maps the archive's central directory, so a read of the lost part raises SIGBUS.
 // Files that were signed before stay signed.
-TEST(Threat, AFileThatShrinksMeanwhileEndsTheProcess) {
+TEST(Threat, FileThatShrinksMeanwhileEndsTheProcess) {
   PackageOptions options = WithLibrariesNamed({"lib/arm64-v8a/libfoo.so"});
   for (int i = 0; i < 1000; ++i) options.entries.push_back({"assets/" + std::to_string(i), {}});
   const Bytes archive = MakePackage(options).Build();

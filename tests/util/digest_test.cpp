@@ -30,7 +30,7 @@ std::string OpensslDigest(const std::string& name, const Bytes& bytes) {
 }
 
 // RFC 1321, A.5.
-TEST(Digest, Md5OfThePublishedVectors) {
+TEST(Digest, Md5MatchesThePublishedVectors) {
   EXPECT_EQ("d41d8cd98f00b204e9800998ecf8427e", HexDigest(ComputeMD5Digest, ""));
   EXPECT_EQ("0cc175b9c0f1b6a831c399e269772661", HexDigest(ComputeMD5Digest, "a"));
   EXPECT_EQ("900150983cd24fb0d6963f7d28e17f72", HexDigest(ComputeMD5Digest, "abc"));
@@ -38,7 +38,7 @@ TEST(Digest, Md5OfThePublishedVectors) {
 }
 
 // FIPS 180-2, appendix A, and NIST's digest of an empty message.
-TEST(Digest, Sha1OfThePublishedVectors) {
+TEST(Digest, Sha1MatchesThePublishedVectors) {
   EXPECT_EQ("da39a3ee5e6b4b0d3255bfef95601890afd80709", HexDigest(ComputeSHA1Digest, ""));
   EXPECT_EQ("a9993e364706816aba3e25717850c26c9cd0d89d", HexDigest(ComputeSHA1Digest, "abc"));
   EXPECT_EQ(
@@ -47,7 +47,7 @@ TEST(Digest, Sha1OfThePublishedVectors) {
 }
 
 // FIPS 180-2, appendix B, and NIST's digest of an empty message.
-TEST(Digest, Sha256OfThePublishedVectors) {
+TEST(Digest, Sha256MatchesThePublishedVectors) {
   EXPECT_EQ("e3b0c44298fc1c149afbf4c8996fb92427ae41e4649b934ca495991b7852b855",
             HexDigest(ComputeSHA256Digest, ""));
   EXPECT_EQ("ba7816bf8f01cfea414140de5dae2223b00361a396177a9cb410ff61f20015ad",
@@ -84,13 +84,13 @@ TEST(Digest, OutputOfAnotherLengthBecomesTheDigestAlone) {
   }
 }
 
-TEST(Digest, Sha256IntoAVectorOfFortyBytesMakesItThirtyTwoLong) {
+TEST(Digest, Sha256ShortensAVectorOf40BytesTo32Bytes) {
   Bytes out(40, 0xEE);
   ComputeSHA256Digest(ToBytes("abc"), out);
   EXPECT_EQ(32U, out.size());
 }
 
-TEST(Digests, EachIsTheOneThatItsNameSays) {
+TEST(Digests, EachMemberHoldsTheDigestOfItsName) {
   const Digests digests = ComputeDigests(ToBytes("abc"));
   EXPECT_EQ("a9993e364706816aba3e25717850c26c9cd0d89d", Hex(digests.sha1));
   EXPECT_EQ("ba7816bf8f01cfea414140de5dae2223b00361a396177a9cb410ff61f20015ad",

@@ -60,19 +60,19 @@ TEST_F(ReadFileTest, EveryByteIsReadAsItIs) {
   EXPECT_EQ(Records(), log.records());
 }
 
-TEST_F(ReadFileTest, EmptyFileIsTrueAndEmpty) {
+TEST_F(ReadFileTest, EmptyFileGivesAnEmptyVector) {
   Bytes out;
   EXPECT_TRUE(ReadFile(MakeFile(""), out));
   EXPECT_TRUE(out.empty());
 }
 
-TEST_F(ReadFileTest, VectorThatHeldMoreEndsWithExactlyTheSizeOfTheFile) {
+TEST_F(ReadFileTest, LongerVectorIsCutToTheSizeOfTheFile) {
   Bytes out(1000, 0xEE);
   EXPECT_TRUE(ReadFile(MakeFile("abc"), out));
   EXPECT_EQ(ToBytes("abc"), out);
 }
 
-TEST_F(ReadFileTest, VectorThatHeldMoreIsEmptyAfterAnEmptyFile) {
+TEST_F(ReadFileTest, LongerVectorIsEmptyAfterAnEmptyFile) {
   Bytes out(1000, 0xEE);
   EXPECT_TRUE(ReadFile(MakeFile(""), out));
   EXPECT_TRUE(out.empty());
@@ -123,7 +123,7 @@ TEST_F(ReadFileTest, SparseFileOfTerabytesHasNoSize) {
   ExpectNoSize(path);
 }
 
-TEST_F(ReadFileTest, MoreThanTheMachinesMemoryIsNotEvenTried) {
+TEST_F(ReadFileTest, FileAsLargeAsTheMachinesMemoryIsNotTried) {
   const std::string path = MakeFile("");
   ASSERT_EQ(0, truncate(path.c_str(), sysconf(_SC_PHYS_PAGES) * sysconf(_SC_PAGESIZE)));
   kernel.mmap = [](size_t) -> void* {
@@ -133,7 +133,7 @@ TEST_F(ReadFileTest, MoreThanTheMachinesMemoryIsNotEvenTried) {
   ExpectNoSize(path);
 }
 
-TEST_F(ReadFileTest, FileThatTheAddressSpaceHasNoRoomForHasNoSize) {
+TEST_F(ReadFileTest, FileTooLargeForTheAddressSpaceHasNoSize) {
   size_t tried = 0;
   kernel.mmap = [&](size_t length) {
     tried = length;
@@ -159,7 +159,7 @@ TEST_F(ReadFileTest, FileThatCannotBeRewoundHasNoSize) {
 }
 
 // The results are those for a file that grows or shrinks between fstat and lseek.
-TEST_F(ReadFileTest, SizeIsTheFilesEndAndNotTheStatesSize) {
+TEST_F(ReadFileTest, SizeComesFromLseekAndNotFromFstat) {
   for (const off_t end : {off_t{2}, off_t{5}}) {
     kernel.lseek = [end](int whence) { return whence == SEEK_END ? end : off_t{0}; };
     Bytes out;
@@ -168,7 +168,7 @@ TEST_F(ReadFileTest, SizeIsTheFilesEndAndNotTheStatesSize) {
   }
 }
 
-TEST_F(ReadFileTest, FileThatShrinksMeanwhileIsTrueAndEndsInZeros) {
+TEST_F(ReadFileTest, FileThatShrinksMeanwhileIsReadAndEndsInZeros) {
   const std::string path = MakeFile("abcdef");
   kernel.read = [&](int fd, void* buffer, size_t size) {
     EXPECT_EQ(0, truncate(path.c_str(), 2));
@@ -204,7 +204,7 @@ TEST_F(ReadFileTest, FileThatGrowsMeanwhileIsReadToItsFirstSize) {
   EXPECT_EQ("abcmore", ContentOf(path));
 }
 
-TEST_F(ReadFileTest, FileThatCannotBeReadIsTrueAndZeros) {
+TEST_F(ReadFileTest, ReadErrorGivesZerosAndNoFailure) {
   kernel.read = [](int, void*, size_t) {
     errno = EIO;
     return ssize_t{-1};
@@ -231,7 +231,7 @@ TEST_F(ReadFileTest, PiecewiseAndInterruptedReadsAreJoined) {
   EXPECT_EQ(std::vector<size_t>({7, 7, 5, 5, 3, 3, 1, 1}), asked);
 }
 
-TEST_F(ReadFileTest, NoDescriptorStaysOpen) {
+TEST_F(ReadFileTest, LeavesNoDescriptorOpen) {
   const int before = NextDescriptor();
   Bytes out;
   EXPECT_TRUE(ReadFile(MakeFile("abc"), out));
@@ -286,7 +286,7 @@ TEST_F(ReadFileTest, EmptyVectorWithMemoryEnoughKeepsIt) {
 
 // ---- Without waiting for a writer, but with waiting for the holder of a lease.
 
-TEST_F(OpenForReadingTest, FifoNeverWouldBlockForReading) {
+TEST_F(OpenForReadingTest, FifoIsOpenedWithoutWaiting) {
   ASSERT_EQ(0, mkfifo(Path("fifo").c_str(), 0600));
   for (const bool has_writer : {false, true}) {
     const int writer = has_writer ? open(Path("fifo").c_str(), O_RDWR | O_CLOEXEC) : -1;
@@ -333,7 +333,7 @@ TEST_F(OpenForReadingTest, SetsErrnoIfTheFileIsNotOpened) {
 
 // ---- The identity of the file.
 
-TEST_F(ReadFileTest, TellsTheFilesStateBeforeAByteWasRead) {
+TEST_F(ReadFileTest, ReturnsTheStateBeforeTheFirstByteIsRead) {
   const std::string path = MakeFile("abc");
   struct stat before, after, read;
   ASSERT_EQ(stat(path.c_str(), &before), 0);

@@ -80,7 +80,7 @@ TEST_F(GetFilenameByFdTest, TargetPathOf4094BytesIsWhole) {
   EXPECT_EQ(deep.path(), GetFilenameByFd(deep.fd()));
 }
 
-TEST_F(GetFilenameByFdTest, TargetPathOf4095BytesIsItsFirst4095Bytes) {
+TEST_F(GetFilenameByFdTest, TargetPathOf4095BytesIsWhole) {
   const DeepDirectory deep(directory_.path(), 4095);
   ASSERT_NE(-1, deep.fd());
   EXPECT_EQ(4095U, GetFilenameByFd(deep.fd()).size());
@@ -88,13 +88,13 @@ TEST_F(GetFilenameByFdTest, TargetPathOf4095BytesIsItsFirst4095Bytes) {
 }
 
 // Linux returns no part of a path of more than 4095 bytes: readlink fails with ENAMETOOLONG.
-TEST_F(GetFilenameByFdTest, TargetPathOf4096BytesIsNotToldByTheKernel) {
+TEST_F(GetFilenameByFdTest, TargetPathOf4096BytesGivesAnEmptyName) {
   const DeepDirectory deep(directory_.path(), 4096);
   ASSERT_NE(-1, deep.fd());
   EXPECT_EQ("", GetFilenameByFd(deep.fd()));
 }
 
-TEST_F(GetFilenameByFdTest, ALongerTargetPathIsItsFirst4095Bytes) {
+TEST_F(GetFilenameByFdTest, LongerTargetPathIsCutTo4095Bytes) {
   std::string target(5000, 'a');
   target[4094] = 'y';
   target[4095] = 'z';
@@ -104,7 +104,7 @@ TEST_F(GetFilenameByFdTest, ALongerTargetPathIsItsFirst4095Bytes) {
   EXPECT_EQ(target.substr(0, 4095), GetFilenameByFd(0));
 }
 
-TEST_F(GetFilenameByFdTest, TheTextEndsAtItsFirstNul) {
+TEST_F(GetFilenameByFdTest, TargetPathEndsAtItsFirstNul) {
   kernel.readlink = [](char* buffer, size_t size) {
     return static_cast<ssize_t>(std::string("/a\0b", 4).copy(buffer, size));
   };

@@ -15,13 +15,13 @@ TEST(Log, ProgressHasPriorityFour) {
   EXPECT_EQ(log.records(), Records({{4, "VeltSign starts: 3.\n"}}));
 }
 
-TEST(Log, AFailureHasPrioritySix) {
+TEST(Log, FailureHasPrioritySix) {
   LogCapture log;
   LogError("Can't open file: %s\n", "/x");
   EXPECT_EQ(log.records(), Records({{6, "Can't open file: /x\n"}}));
 }
 
-TEST(Log, NoLineEndIsAdded) {
+TEST(Log, AddsNoLineEnd) {
   LogCapture log;
   LogError("Unknown certificate type");
   EXPECT_EQ(log.records(), Records({{6, "Unknown certificate type"}}));
@@ -55,7 +55,7 @@ TEST(Log, LongerTextIsCutTo1023Bytes) {
   EXPECT_EQ(log.records(), Records({{6, std::string(1023, 'x')}}));
 }
 
-TEST(Log, ARecordEndsAtANulCharacter) {
+TEST(Log, RecordEndsAtANulCharacter) {
   LogCapture log;
   LogError("after colon: %c\n", '\0');
   EXPECT_EQ(log.records(), Records({{6, "after colon: "}}));

@@ -12,12 +12,12 @@ size_t AllOfTheMachine() {
   return static_cast<size_t>(sysconf(_SC_PHYS_PAGES)) * static_cast<size_t>(sysconf(_SC_PAGESIZE));
 }
 
-TEST(FitsInMemory, NothingAndOnePageFit) {
+TEST(FitsInMemory, ZeroBytesAndOnePageFit) {
   EXPECT_TRUE(FitsInMemory(0));
   EXPECT_TRUE(FitsInMemory(static_cast<size_t>(sysconf(_SC_PAGESIZE))));
 }
 
-TEST(FitsInMemory, AllMemoryOfTheMachineAndMoreDoNot) {
+TEST(FitsInMemory, AllMemoryOfTheMachineAndMoreDoNotFit) {
   EXPECT_FALSE(FitsInMemory(AllOfTheMachine()));
   EXPECT_FALSE(FitsInMemory(SIZE_MAX));
 }
@@ -30,7 +30,7 @@ size_t AddressesTaken() {
   return pages * static_cast<size_t>(sysconf(_SC_PAGESIZE));
 }
 
-TEST(FitsInMemory, TheTrialMemoryIsFreed) {
+TEST(FitsInMemory, TrialMemoryIsFreed) {
   const size_t size = AllOfTheMachine() / 2;
   const size_t before = AddressesTaken();
   ASSERT_TRUE(FitsInMemory(size));

@@ -176,20 +176,20 @@ Counts Of(int valid, int wrong_hash, int lenient, int refused, int other_length)
   return counts;
 }
 
-TEST(Vectors, OfThisProjectAreJudgedAsTheySay) {
+TEST(Vectors, OwnVectorsGetTheExpectedVerdicts) {
   EXPECT_EQ(JudgeFile(VECTORS_DIR "/rsa_signature_apktoolkit_test.json"), Of(16, 0, 9, 127, 0));
 }
 
-TEST(Vectors, OfThisProjectAreMadeByTheirRecipe) {
+TEST(Vectors, OwnVectorsAreTheOutputOfMakeVectors) {
   EXPECT_TRUE(RunProcess({VECTORS_DIR "/make_vectors"}).output ==
               ContentOf(VECTORS_DIR "/rsa_signature_apktoolkit_test.json"));
 }
 
-TEST(Vectors, OfWycheproofFor2048BitsAreJudgedAsTheySay) {
+TEST(Vectors, WycheproofVectorsOf2048BitsGetTheExpectedVerdicts) {
   EXPECT_EQ(JudgeFile(VECTORS_DIR "/wycheproof_2048_sha256.json"), Of(9, 2, 0, 246, 2));
 }
 
-TEST(Vectors, OfWycheproofFor3072BitsAreJudgedAsTheySay) {
+TEST(Vectors, WycheproofVectorsOf3072BitsGetTheExpectedVerdicts) {
   EXPECT_EQ(JudgeFile(VECTORS_DIR "/wycheproof_3072_sha256.json"), Of(8, 2, 0, 247, 2));
 }
 
@@ -216,7 +216,7 @@ INSTANTIATE_TEST_SUITE_P(Files, VectorsOfTheDirectory, testing::ValuesIn(NamesIn
 
 // This project has shortened copies of some of these files (wycheproof_*.json). take_wycheproof
 // must print exactly this copy if there is one.
-TEST_P(VectorsOfTheDirectory, AreJudgedAsTheySay) {
+TEST_P(VectorsOfTheDirectory, GetTheExpectedVerdictsAndMatchTheirCopies) {
   EXPECT_GT(JudgeFile(file_).refused, 0);
   std::string kept = GetParam() + ".json";
   kept.replace(0, strlen("rsa_signature_"), VECTORS_DIR "/wycheproof_");

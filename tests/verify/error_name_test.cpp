@@ -18,6 +18,6 @@ TEST(ErrorName, IsTheNameThatTheCLibraryHas) {
   EXPECT_EQ(named, 131);  // in include/uapi/asm-generic of Linux: 1 to 133 without 41 and 58
 }
 
-TEST(ErrorName, OfAnUnknownNumberIsADash) {
+TEST(ErrorName, IsADashForAnUnknownNumber) {
   for (const int error : {0, -1, -126, INT_MIN, INT_MAX}) EXPECT_EQ(ErrorName(error), "-") << error;
 }

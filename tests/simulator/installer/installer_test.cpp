@@ -60,7 +60,7 @@ TEST(InstallerProcess, GetsTheLevelsAndOnePathALine) {
   EXPECT_EQ(ContentOf(java / "asked"), "28 33\n");
 }
 
-TEST(InstallerProcess, IsStartedForAPackageAlone) {
+TEST(InstallerProcess, IsNotStartedForAFileThatIsNotAPackage) {
   const FakeJava java("touch \"$(dirname \"$0\")/started\"");
   const DiskFile text(ToBytes("no archive")), jar(MakePackage(PlainJar()).Build());
   const InstallerOptions options = Patient(30);
@@ -73,7 +73,7 @@ TEST(InstallerProcess, IsStartedForAPackageAlone) {
   EXPECT_NE(RunProcess({"test", "-e", java / "started"}).status, 0);
 }
 
-TEST(InstallerProcess, ThatIsOffIsNotStarted) {
+TEST(InstallerProcess, IsNotStartedWhenItIsOff) {
   const FakeJava java("touch \"$(dirname \"$0\")/started\"");
   const DiskFile package(MakePackage().Build());
   InstallerOptions options = Patient(30);
@@ -114,7 +114,7 @@ TEST(InstallerProcess, IsEndedAndStartedAgainWhenTheTimeIsUp) {
   EXPECT_EQ(installer.Judge(package.path()).state, Judgement::State::kJudged);
 }
 
-TEST(InstallerProcess, ThatDoesNotStopSayingIsNoAnswer) {
+TEST(InstallerProcess, EndlessOutputIsNoAnswer) {
   const FakeJava java("tr '\\0' x </dev/zero");
   const DiskFile package(MakePackage().Build());
   const InstallerOptions options = Patient(60);
@@ -123,7 +123,7 @@ TEST(InstallerProcess, ThatDoesNotStopSayingIsNoAnswer) {
 
 // ---- The messages to the user.
 
-TEST(InstallerProcess, ThatGaveUpMakesNoSuccess) {
+TEST(InstallerProcess, FailsTheRunWithStatusThreeWhenItGivesUp) {
   const FakeJava java("read -r path");
   const DiskFile package(MakePackage().Build());
   const ProcessResult run = RunProcess({"env", "LC_ALL=C.UTF-8", SimulatorPath(), package.path()});
@@ -135,7 +135,7 @@ TEST(InstallerProcess, ThatGaveUpMakesNoSuccess) {
             "apktoolkit-sim: " + package.path() + ": the installer's verifier gave up: it ended\n");
 }
 
-TEST(InstallerProcess, ThatIsMissingIsToldOnce) {
+TEST(InstallerProcess, IsReportedOnceWhenItIsMissing) {
   const DiskFile package(MakePackage().Build());
   const auto run = [&](const std::string& when) {
     return RunProcess(

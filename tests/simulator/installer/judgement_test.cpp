@@ -61,7 +61,7 @@ TEST(Judgement, FailureIsNoAnswer) {
   EXPECT_EQ(WhyNone(R"({"failure":"java.lang.OutOfMemoryError"})"), "java.lang.OutOfMemoryError");
 }
 
-TEST(Judgement, WhatDoesNotReadIsNoAnswer) {
+TEST(Judgement, MalformedAnswerIsNoAnswer) {
   for (const std::string& answer :
        {std::string(), std::string("nonsense"), std::string("[]"), std::string("{}"),
         std::string(R"({"ranges":[]})"), std::string(R"({"ranges":{}})"),
@@ -76,14 +76,14 @@ TEST(Judgement, WhatDoesNotReadIsNoAnswer) {
 }
 
 // Java reads some certificates that the phone's crypto library refuses.
-TEST(Judgement, SignerWhoseCertificateIsNotReadIsNoAnswer) {
+TEST(Judgement, SignerWithAnUnreadableCertificateIsNoAnswer) {
   EXPECT_EQ(WhyNone(Answer("true", R"([{"scheme":"v2","certificate":"3000"}])", "[]")),
             "the crypto library does not read the certificate of the v2 signer");
 }
 
 // Without this check, a package could be installable with errors or without a signer, or refused
 // without an error.
-TEST(Judgement, AnswerThatContradictsItselfIsNone) {
+TEST(Judgement, AnswerThatContradictsItselfIsNoAnswer) {
   EXPECT_EQ(WhyNone(Answer("true", kSigner, kError)), "its answer is malformed");
   EXPECT_EQ(WhyNone(Answer("true", "[]", "[]")), "its answer is malformed");
   EXPECT_EQ(WhyNone(Answer("false", "[]", "[]")), "its answer is malformed");

@@ -59,7 +59,7 @@ Bytes WithStringsInOneAnother(Bytes bytes) {
 
 }  // namespace
 
-TEST(AndroidManifestFacts, PackageNameInEitherEncoding) {
+TEST(AndroidManifestFacts, PackageNameIsReadInEitherEncoding) {
   for (const auto pool : kPools) {
     for (const std::string& name :
          {std::string("com.example.\u00fc\u20ac\U0001f600"), std::string(300, 'n')}) {
@@ -74,7 +74,7 @@ TEST(AndroidManifestFacts, PackageNameInEitherEncoding) {
 
 // The tool uses the first attribute with this local name. The installer uses the attribute without
 // a namespace.
-TEST(AndroidManifestFacts, PackageNameOfAnotherNamespaceIsTheToolsAlone) {
+TEST(AndroidManifestFacts, PackageNameWithANamespaceCountsOnlyForTheTool) {
   for (const auto pool : kPools) {
     CompiledXml xml(pool);
     xml.Element("manifest", {InAndroidNamespace(StringAttribute("package", "com.victim")),
@@ -85,21 +85,21 @@ TEST(AndroidManifestFacts, PackageNameOfAnotherNamespaceIsTheToolsAlone) {
   }
 }
 
-TEST(AndroidManifestFacts, PackageNameThatIsNoTextIsTheToolsToPassOver) {
+TEST(AndroidManifestFacts, PackageNameThatIsNoTextIsEmpty) {
   const AndroidManifest manifest =
       ParseAndroidManifest(CompiledXml().Element("manifest", {IntAttribute("package", 5)}).Build());
   EXPECT_EQ(manifest.package_name, "");
   EXPECT_EQ(manifest.installer_name, "");
 }
 
-TEST(AndroidManifestFacts, PackageNameOfAnElementInsideIsTheToolsAlone) {
+TEST(AndroidManifestFacts, PackageNameOfAnInnerElementCountsOnlyForTheTool) {
   CompiledXml xml;
   xml.Start("manifest").Element("manifest", {StringAttribute("package", "p")}).End("manifest");
   EXPECT_EQ(ParseAndroidManifest(xml.Build()).package_name, "p");
   EXPECT_EQ(ParseAndroidManifest(xml.Build()).installer_name, "");
 }
 
-TEST(AndroidManifestFacts, WhetherLibrariesAreExtracted) {
+TEST(AndroidManifestFacts, BooleanExtractNativeLibsIsRead) {
   for (const auto pool : kPools) {
     EXPECT_EQ(Extracts({}, pool), std::nullopt);
     EXPECT_EQ(Extracts({Boolean("extractNativeLibs", true)}, pool), true);
@@ -117,7 +117,7 @@ TEST(AndroidManifestFacts, LibrariesAreExtractedForAnyNumberButZero) {
   EXPECT_EQ(Extracts({ReferenceAttribute("extractNativeLibs", 0)}), std::nullopt);
 }
 
-TEST(AndroidManifestFacts, OfTwoApplicationsTheFirstCounts) {
+TEST(AndroidManifestFacts, FirstOfTwoApplicationsCounts) {
   CompiledXml xml;
   xml.Start("manifest", {StringAttribute("package", "p")})
       .Element("application", {Boolean("extractNativeLibs", true)})
@@ -132,7 +132,7 @@ TEST(AndroidManifestFacts, OfTwoApplicationsTheFirstCounts) {
   EXPECT_EQ(ParseAndroidManifest(other.Build()).extracts_libraries, std::nullopt);
 }
 
-TEST(AndroidManifestFacts, WhatDoesNotReadIsNotThere) {
+TEST(AndroidManifestFacts, MalformedDocumentHasNoPackageName) {
   EXPECT_EQ(ParseAndroidManifest({}).package_name, std::nullopt);
   EXPECT_EQ(ParseAndroidManifest(ToBytes("<manifest package=\"p\"/>")).package_name, std::nullopt);
   const Bytes whole = CompiledManifest("com.example.app", true);
@@ -147,7 +147,7 @@ TEST(AndroidManifestFacts, WhatDoesNotReadIsNotThere) {
             "");
 }
 
-TEST(AndroidManifestFacts, DocumentWhoseStringsLieInOneAnotherIsNotRead) {
+TEST(AndroidManifestFacts, DocumentWithOverlappingStringsIsNotRead) {
   std::vector<XmlAttribute> attributes = {StringAttribute("package", std::string(5000, 'p'))};
   for (int i = 0; i < 200; ++i) attributes.push_back(IntAttribute("a" + std::to_string(i), 0));
   PackageOptions options;

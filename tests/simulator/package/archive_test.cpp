@@ -52,19 +52,19 @@ ArchiveWalk WalkOf(const Bytes& zip) {
 
 }  // namespace
 
-TEST(Archive, EntriesAreThoseOfTheDirectoryInItsOrder) {
+TEST(Archive, EntriesAreInTheOrderOfTheDirectory) {
   EXPECT_EQ(EntriesOf(BuildZip({Good("b"), Good("a"), Good("\x01\u00e9")})),
             Lines({"b 9", "a 9", "\x01\u00e9 11"}));
 }
 
-TEST(Archive, DamagedEntryIsNamedAndEndsNothing) {
+TEST(Archive, DamagedEntryIsMarkedAndOthersAreListed) {
   EXPECT_EQ(EntriesOf(BuildZip({Good("a"), Damaged("b"), Good("c")})),
             Lines({"a 9", "b 9 damaged", "c 9"}));
 }
 
 // The zip library chooses the order in which Walk() meets the entries, so the test damages each
 // entry in turn.
-TEST(Archive, WalkTellsWhereTheToolsEnds) {
+TEST(Archive, WalkShowsWhereTheToolStops) {
   const Lines names = {"lib/x/a.so", "lib/x/b.so", "lib/x/c.so"};
   const Lines order = WalkOf(BuildZip({Good(names[0]), Good(names[1]), Good(names[2])})).names;
   ASSERT_EQ(order.size(), 3U);
@@ -82,7 +82,7 @@ TEST(Archive, WalkTellsWhereTheToolsEnds) {
   EXPECT_EQ(WalkOf(BuildZip({Good("res/a"), Damaged("res/b")})).names, Lines());
 }
 
-TEST(Archive, WalkWithoutDamageIsMetWhole) {
+TEST(Archive, WalkWithoutDamageReachesAllNames) {
   EXPECT_EQ(WalkOf(BuildZip({Good("lib/x/a.so"), Good("lib/x/b.so")})).met, 2U);
 }
 
@@ -159,7 +159,7 @@ TEST(Archive, SurvivesAFileThatShrinks) {
 }
 
 // A SIGBUS outside a guard ends the process.
-TEST(ShrinkGuardDeathTest, GuardsItsOwnTimeAlone) {
+TEST(ShrinkGuardDeathTest, GuardsOnlyWhileItExists) {
   const auto touch = [](bool guarded) {
     const int fd = memfd_create("page", MFD_CLOEXEC);
     volatile char* const page =
@@ -210,7 +210,7 @@ Lines NamesAfter(const std::function<void(Bytes* zip, ptrdiff_t directory)>& cha
 
 // A central directory header has 46 bytes, then the name, the extra field and the comment. The
 // lengths of the extra field and the comment are at the offsets 30 and 32 (APPNOTE.TXT 4.3.12).
-TEST(ReadDirectory, PassesOverWhatStandsBehindTheNames) {
+TEST(ReadDirectory, SkipsTheExtraFieldAndTheComment) {
   const auto add = [](Bytes* zip, ptrdiff_t directory) {
     const Bytes more = ToBytes("extracomment");
     (*zip)[static_cast<size_t>(directory) + 30] = 5;
@@ -228,7 +228,7 @@ TEST(ReadDirectory, EndsWhereItIsCutOrHasNoMark) {
   EXPECT_EQ(NamesAfter(unmark), Lines({"a"}));
 }
 
-TEST(ArchiveEnd, MayLieAboutItsDirectory) {
+TEST(ArchiveEnd, FalseDirectoryOffsetGivesNoEntries) {
   Bytes zip = BuildZip({Good("a")});
   zip[zip.size() - 22 + 19] = 0xff;  // the highest byte of the directory's offset
   const MemoryFile file(zip);
@@ -238,7 +238,7 @@ TEST(ArchiveEnd, MayLieAboutItsDirectory) {
   EXPECT_TRUE(ReadDirectory(file.fd(), *end).empty());
 }
 
-TEST(ArchiveEnd, OfWhatIsNoArchiveIsNone) {
+TEST(ArchiveEnd, IsNotFoundInAFileThatIsNoArchive) {
   const MemoryFile empty({});
   EXPECT_FALSE(FindArchiveEnd(empty.fd()).has_value());
   const MemoryFile text(ToBytes("no archive, but long enough to hold the record of an end"));

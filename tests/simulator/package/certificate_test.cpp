@@ -35,7 +35,7 @@ Certificate Of(const std::string& key) {
 }  // namespace
 
 // The expected values are those of openssl and coreutils.
-TEST(CertificateFacts, OfAnRsaKey) {
+TEST(CertificateFacts, MatchOpensslForAnRsaKey) {
   const Bytes der = Of("rsa-2048").Build();
   const auto facts = ParseCertificate(View(der));
   ASSERT_TRUE(facts.has_value());
@@ -60,7 +60,7 @@ TEST(CertificateFacts, OfAnRsaKey) {
 
 // The last second of the validity can be before 1970 or after 2049 (RFC 5280 §4.1.2.5). The
 // expected values are those of openssl and date.
-TEST(CertificateFacts, LastSecond) {
+TEST(CertificateFacts, LastSecondMayBeBefore1970OrAfter2049) {
   const auto last = [](uint8_t tag, const std::string& end) {
     Certificate certificate = Of("rsa-2048");
     certificate.validity =
@@ -84,7 +84,7 @@ TEST(CertificateFacts, LastSecond) {
   EXPECT_EQ(last(der::kUtcTime, "no time"), "none");
 }
 
-TEST(CertificateFacts, OfAnEcKey) {
+TEST(CertificateFacts, EcKeyHasBitsButNoModulus) {
   const Bytes der = Of("ec-p256").Build();
   const auto facts = ParseCertificate(View(der));
   ASSERT_TRUE(facts.has_value());
@@ -93,7 +93,7 @@ TEST(CertificateFacts, OfAnEcKey) {
   EXPECT_EQ(facts->key.modulus_sha256, "");
 }
 
-TEST(CertificateFacts, OfAnIssuedCertificate) {
+TEST(CertificateFacts, IssuedCertificateNamesItsIssuer) {
   Certificate certificate = Of("rsa-2048");
   certificate.issuer = Name({{"2.5.4.3", "Authority"}});
   certificate.digest = Digest::kSha1;
@@ -105,7 +105,7 @@ TEST(CertificateFacts, OfAnIssuedCertificate) {
   EXPECT_EQ(facts->signature_algorithm, "SHA1withRSA");
 }
 
-TEST(CertificateFacts, KeyThatDoesNotReadIsNamedByItsAlgorithm) {
+TEST(CertificateFacts, KeyThatCannotBeParsedHasOnlyItsAlgorithm) {
   Certificate certificate = Of("rsa-2048");
   certificate.public_key_info = PublicKeyInfoAround(ToBytes("no key"));
   const Bytes der = certificate.Build();
@@ -127,7 +127,7 @@ TEST(CertificateFacts, CutCertificateHasNone) {
 
 // The certificate names the algorithm of its signature twice. The name outside the signed part
 // counts.
-TEST(CertificateFacts, AlgorithmIsThatOfTheSignature) {
+TEST(CertificateFacts, AlgorithmOutsideTheSignedPartCounts) {
   Certificate certificate = Of("rsa-2048");
   certificate.tbs_algorithm = AlgorithmIdentifier(RsaSignatureOid(Digest::kSha1));
   certificate.signature_algorithm = AlgorithmIdentifier("1.2.840.113549.1.1.12");
@@ -137,7 +137,7 @@ TEST(CertificateFacts, AlgorithmIsThatOfTheSignature) {
   EXPECT_FALSE(facts->has_known_digest);
 }
 
-TEST(CertificateFacts, AlgorithmsHaveTheNamesThatKeytoolTakes) {
+TEST(CertificateFacts, AlgorithmsHaveTheNamesThatKeytoolUses) {
   const auto name = [](const std::string& oid) {
     Certificate certificate = Of("rsa-2048");
     certificate.signature_algorithm = AlgorithmIdentifier(oid);
@@ -153,7 +153,7 @@ TEST(CertificateFacts, AlgorithmsHaveTheNamesThatKeytoolTakes) {
   EXPECT_EQ(name("1.2.3.4"), "1.2.3.4");
 }
 
-TEST(CertificateFacts, SignersNameItByTwoIdentifiers) {
+TEST(CertificateFacts, HaveTheTwoIdentifiersThatSignersUse) {
   Certificate certificate = Of("rsa-2048");
   certificate.issuer = Name({{"2.5.4.3", "Authority"}});
   auto facts = ParseCertificate(View(certificate.Build()));
@@ -171,7 +171,7 @@ TEST(CertificateFacts, AttributeThatIsNoTextIsShownAsDigits) {
   EXPECT_EQ(ParseCertificate(View(certificate.Build()))->subject, "CN=#030200AB");
 }
 
-TEST(CertificateFacts, NamesBeyondReasonAreCut) {
+TEST(CertificateFacts, NamesAreCutAfter256Attributes) {
   std::vector<std::pair<std::string, std::string>> attributes(300, {"2.5.4.3", "x"});
   Certificate certificate = Of("rsa-2048");
   certificate.subject = Name(attributes);
@@ -179,7 +179,7 @@ TEST(CertificateFacts, NamesBeyondReasonAreCut) {
   EXPECT_EQ(std::count(subject.begin(), subject.end(), '='), 256);
 }
 
-TEST(CertificateFacts, BytesBehindItDoNotCount) {
+TEST(CertificateFacts, BytesAfterTheCertificateAreIgnored) {
   Bytes der = Of("rsa-2048").Build();
   const std::string digest = ParseCertificate(View(der))->sha256;
   der.push_back(0);
@@ -188,7 +188,7 @@ TEST(CertificateFacts, BytesBehindItDoNotCount) {
 
 // The expected texts are the owners that keytool prints. keytool writes names with a class of the
 // JDK.
-TEST(NameText, IsWhatTheJdkWrites) {
+TEST(CertificateName, IsWhatTheJdkWrites) {
   const std::vector<Bytes> names = {
       Name({{"2.5.4.6", "AB"},
             {"2.5.4.8", "A State"},

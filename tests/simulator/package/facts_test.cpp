@@ -44,7 +44,7 @@ TEST(PackageFacts, HaveTheDigestOfTheFile) {
 }
 
 // mknod makes a socket at which no process listens.
-TEST(FileKind, OfWhatCannotBeOpenedIsNotTold) {
+TEST(FileKind, SocketOrMissingFileHasItsErrno) {
   const TempDir directory;
   const std::string socket = directory / "socket";
   ASSERT_EQ(mknod(socket.c_str(), S_IFSOCK | 0600, 0), 0);
@@ -52,7 +52,7 @@ TEST(FileKind, OfWhatCannotBeOpenedIsNotTold) {
   EXPECT_EQ(LookAt(directory / "none").error, ENOENT);
 }
 
-TEST(FileKind, IsToldByWhatTheFileIs) {
+TEST(FileKind, DependsOnTypeAndContentOfTheFile) {
   const TempDir directory;
   const std::string pipe = directory / "pipe";
   ASSERT_EQ(mkfifo(pipe.c_str(), 0600), 0);
@@ -71,13 +71,13 @@ TEST(FileKind, IsToldByWhatTheFileIs) {
   EXPECT_EQ(FactsOf({package.begin(), package.begin() + 500}).kind, FileKind::kCutArchive);
 }
 
-TEST(FileKind, FileThatCannotBeOpenedSaysWhy) {
+TEST(FileKind, MissingFileIsUnreadableWithEnoent) {
   const PackageFacts missing = LookAt("/nowhere/base.apk");
   EXPECT_EQ(missing.kind, FileKind::kUnreadable);
   EXPECT_EQ(missing.error, ENOENT);
 }
 
-TEST(PackageFacts, OfASignedPackage) {
+TEST(PackageFacts, AreFoundInASignedPackage) {
   PackageOptions options = WithLibraries({{"lib/arm64-v8a/liba.so", ToBytes("a")},
                                           {"lib/x86/libb.so", ToBytes("b")},
                                           {"lib/readme.txt", ToBytes("c")}});
@@ -105,7 +105,7 @@ TEST(PackageFacts, OfASignedPackage) {
             std::vector<std::string>({"META-INF/services/x", "added"}));
 }
 
-TEST(PackageFacts, OfNewerSigners) {
+TEST(PackageFacts, IncludeSignersOfNewerSchemes) {
   const Bytes certificate = SignatureBlock().SignerCertificate().Build();
   const Bytes signer = Signers({SignerBytes(certificate)});
   const Bytes block = SigningBlockBytes({{kSchemeV2, signer}, {kSchemeV3, signer}});
@@ -121,13 +121,13 @@ TEST(PackageFacts, OfNewerSigners) {
                   .has_damaged_signing_block);
 }
 
-TEST(PackageFacts, OfAJar) {
+TEST(PackageFacts, JarHasAManifestButNoPackageName) {
   const PackageFacts facts = FactsOf(MakePackage(PlainJar()).Build());
   EXPECT_EQ(facts.manifest.package_name, std::nullopt);
   EXPECT_EQ(facts.jar.manifest, Archive::ReadResult::kRead);
 }
 
-TEST(PackageFacts, EntryThatLiesAboutItsLengthIsNotRead) {
+TEST(PackageFacts, EntryWithAFalseLengthIsDamaged) {
   Package package = MakePackage();
   ZipItem& manifest = package.Item(kManifestName);
   manifest = ClaimingLength(manifest, 0xfffffff0);
@@ -135,7 +135,7 @@ TEST(PackageFacts, EntryThatLiesAboutItsLengthIsNotRead) {
   EXPECT_EQ(facts.jar.manifest, Archive::ReadResult::kDamaged);
 }
 
-TEST(PackageFacts, ListedAreTheEntriesThatTheToolFindsADigestFor) {
+TEST(PackageFacts, EntryIsListedIfTheToolFindsItsDigest) {
   const std::string manifest =
       "Manifest-Version: 1.0\r\n\r\nName: a\r\nSHA-256-Digest: x\r\n\r\nName: b\r\n\r\n"
       "Name: c\r\nMD5-Digest: y\r\n\r\n";
@@ -146,7 +146,7 @@ TEST(PackageFacts, ListedAreTheEntriesThatTheToolFindsADigestFor) {
             std::vector<std::string>({"a", "c"}));
 }
 
-TEST(PackageFacts, EntriesWithSha1DigestsAreThoseThatTheToolReadsSo) {
+TEST(PackageFacts, EntryWithASha1DigestIsMarked) {
   PackageOptions options = WithManifest(
       "Manifest-Version: 1.0\r\n\r\nName: a\r\nSHA1-Digest: x\r\n\r\n"
       "Name: b\r\nSHA-256-Digest: x\r\n\r\nName: c\r\nMD5-Digest: y\r\n\r\n");
@@ -191,7 +191,7 @@ TEST(PackageFacts, EachListedEntryIsComparedWithItsDigest) {
 }
 
 // An entry in a directory below META-INF is an ordinary entry.
-TEST(PackageFacts, SignatureFilesLieInMetaInfItself) {
+TEST(PackageFacts, SignatureFilesAreDirectlyInMetaInf) {
   Package package = MakePackage();
   for (const char* name :
        {"META-INF/sub/A.SF", "META-INF/A.EC", "META-INF/A.DSA", "A.RSA", "META-INF/A.RSA.txt"}) {
@@ -202,7 +202,7 @@ TEST(PackageFacts, SignatureFilesLieInMetaInfItself) {
                                       "META-INF/CERT.SF", "META-INF/MANIFEST.MF"}));
 }
 
-TEST(PackageFacts, DamagedEntriesAreThereAllTheSame) {
+TEST(PackageFacts, IncludeDamagedEntries) {
   PackageOptions options = WithLibraries({{"lib/arm64-v8a/liba.so", ToBytes("a")}});
   Package package = MakePackage(options);
   package.Item("lib/arm64-v8a/liba.so").local.crc = 1;
@@ -219,7 +219,7 @@ TEST(PackageFacts, DamagedEntriesAreThereAllTheSame) {
 
 // The zip library chooses the order of the entries, and so decides which libraries come after the
 // damage.
-TEST(PackageFacts, LibrariesBehindDamageAreNotMet) {
+TEST(PackageFacts, LibrariesAfterADamagedOneAreNotReached) {
   PackageOptions options;
   for (int i = 0; i < 64; ++i) {
     options.entries.push_back({"lib/arm64-v8a/lib" + std::to_string(i) + ".so", ToBytes("a")});
@@ -238,7 +238,7 @@ TEST(PackageFacts, LibrariesBehindDamageAreNotMet) {
   EXPECT_LT(count_met(facts), 45) << "those that can be extracted";
 }
 
-TEST(PackageFacts, TellWhatIsTooLongToBeLookedInto) {
+TEST(PackageFacts, ListThePartsThatAreTooLong) {
   Package package = MakePackage();
   ZipItem& manifest = package.Item(kManifestName);
   manifest.data.resize(Archive::kLongestRead + 1, ' ');
@@ -271,7 +271,7 @@ TEST(PackageFacts, FileThatShrinksMeanwhileWasChanged) {
 }
 
 // Each library is opened as the tool opens it, but without waiting.
-TEST(PackageFacts, TellWhatLiesWhereTheToolLooksForALibrary) {
+TEST(PackageFacts, ShowWhetherTheToolCanOpenEachLibrary) {
   const std::vector<std::string> names = {"there", "missing", "pipe", "loop", "leased"};
   PackageOptions options;
   for (const std::string& name : names) {

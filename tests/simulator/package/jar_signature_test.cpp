@@ -34,7 +34,7 @@ const Bytes kExponent = {1, 0, 1};
 
 }  // namespace
 
-TEST(ToolKey, IsThatOfTheCertificate) {
+TEST(KeyReadByTool, IsThatOfTheCertificate) {
   const JarSignatureFacts jar = SignatureOf(WithKey(Concat({{0}, Modulus()}), kExponent));
   ASSERT_TRUE(jar.key.has_value());
   EXPECT_EQ(jar.key->modulus_sha256, DigestOfModulus(Modulus()));
@@ -48,7 +48,7 @@ TEST(ToolKey, IsThatOfTheCertificate) {
 
 // The last four bytes of an eight-byte exponent overwrite the tool's modulus length. Here they are
 // 100 in the byte order of the host.
-TEST(ToolKey, MayBeAPartOfTheModulus) {
+TEST(KeyReadByTool, MayBeAPartOfTheModulus) {
   const JarSignatureFacts jar =
       SignatureOf(WithKey(Concat({{0}, Modulus()}), {1, 0, 1, 0, 100, 0, 0, 0}));
   ASSERT_TRUE(jar.key.has_value());
@@ -58,7 +58,7 @@ TEST(ToolKey, MayBeAPartOfTheModulus) {
 }
 
 // The tool removes only one leading zero, even if there are more.
-TEST(ToolKey, MayBeginWithAZero) {
+TEST(KeyReadByTool, MayBeginWithAZero) {
   const JarSignatureFacts jar = SignatureOf(WithKey(Concat({{0, 0}, Modulus()}), kExponent));
   ASSERT_TRUE(jar.key.has_value());
   EXPECT_EQ(jar.key->modulus_sha256, DigestOfModulus(Concat({{0}, Modulus()})));
@@ -66,7 +66,7 @@ TEST(ToolKey, MayBeginWithAZero) {
   EXPECT_EQ(jar.key->bits, 2048);
 }
 
-TEST(ToolKey, OfAnExponentThatReadsAsOneIsForgeable) {
+TEST(KeyReadByTool, IsForgeableWithExponentOneOrMinusOne) {
   const auto key = [](const Bytes& exponent) {
     return SignatureOf(WithKey(Concat({{0}, Modulus()}), exponent)).key.value_or(ToolKey());
   };
@@ -78,13 +78,13 @@ TEST(ToolKey, OfAnExponentThatReadsAsOneIsForgeable) {
   EXPECT_FALSE(key({3}).is_forgeable);
 }
 
-TEST(ToolKey, ThatEndsBeyondTheBlockIsNone) {
+TEST(KeyReadByTool, IsEmptyIfItEndsBeyondTheBlock) {
   const JarSignatureFacts jar =
       SignatureOf(WithKey(Concat({{0}, Modulus()}), {1, 0, 1, 0, 0xff, 0xff, 0xff, 0x7f}));
   EXPECT_FALSE(jar.key.has_value());
 }
 
-TEST(ToolKey, OfAnEcKeyIsNone) {
+TEST(KeyReadByTool, IsEmptyForAnEcKey) {
   PackageOptions options;
   options.block.key = "ec-p256";
   const JarSignatureFacts jar = SignatureOf(MakePackage(options));
@@ -95,7 +95,7 @@ TEST(ToolKey, OfAnEcKeyIsNone) {
 
 // The facts have no certificate if the strict DER parser does not find the certificate that the
 // tool reads.
-TEST(JarSignatureFacts, CertificateThatTheToolDoesNotReadIsNotShown) {
+TEST(JarSignatureFacts, CertificateIsMissingIfTheBlockIsNotDer) {
   Package package = MakePackage();
   Bytes& block = package.Item("META-INF/CERT.RSA").data;
   const JarSignatureFacts before = SignatureOf(package);
@@ -148,7 +148,7 @@ TEST(JarSignatureFacts, BlockIsTheOneThatTheToolLooksFor) {
   EXPECT_FALSE(jar.has_block);
 }
 
-TEST(SignatureFile, SaysWhichOtherSchemesThereAre) {
+TEST(SignatureFile, ClaimsSchemesOnlyInItsFirstSection) {
   const auto claimed = [](const std::string& text) {
     PackageOptions options;
     options.edit_signature_file = [&text](const std::string&) { return text; };

@@ -16,7 +16,7 @@ const Bytes kSignatureFile = ToBytes("Signature-Version: 1.0\r\n\r\n");
 
 }  // namespace
 
-TEST(SignatureBlockFacts, OfABlockAsApksignerMakesIt) {
+TEST(SignatureBlockFacts, AreWholeForABlockAsApksignerMakesIt) {
   const SignatureBlock block;
   const Bytes der = block.Build(kSignatureFile);
   const SignatureBlockFacts facts = ParseSignatureBlock(View(der));
@@ -40,7 +40,7 @@ TEST(SignatureBlockFacts, SeeSignedAttributes) {
   EXPECT_TRUE(facts.has_known_digest);
 }
 
-TEST(SignatureBlockFacts, OfSeveralTheFirstIsTold) {
+TEST(SignatureBlockFacts, FirstCertificateAndSignerAreUsed) {
   SignatureBlock block;
   const Bytes certificate = block.SignerCertificate().Build();
   Certificate other;
@@ -62,7 +62,7 @@ TEST(SignatureBlockFacts, OfSeveralTheFirstIsTold) {
   EXPECT_EQ(facts.signer_id, std::string(id.begin(), id.end()));
 }
 
-TEST(SignatureBlockFacts, DigestsThatTheToolDoesNotReadHaveTheirNames) {
+TEST(SignatureBlockFacts, DigestsThatTheToolCannotUseAreNamed) {
   const auto digest = [](const std::string& oid) {
     SignatureBlock block;
     block.digest_algorithm = AlgorithmIdentifier(oid);
@@ -79,7 +79,7 @@ TEST(SignatureBlockFacts, DigestsThatTheToolDoesNotReadHaveTheirNames) {
 
 // RFC 4056 §3: the field signatureAlgorithm identifies RSASSA-PSS. The field digestAlgorithm does
 // not.
-TEST(SignatureBlockFacts, SeeRsassaPss) {
+TEST(SignatureBlockFacts, RsassaPssIsFoundInTheSignatureAlgorithm) {
   const auto has_pss = [](const std::string& digest, const std::string& algorithm) {
     SignatureBlock block;
     block.signer_infos = der::Set({der::Sequence(
@@ -95,7 +95,7 @@ TEST(SignatureBlockFacts, SeeRsassaPss) {
   EXPECT_FALSE(has_pss(pss, "1.2.840.113549.1.1.1"));
 }
 
-TEST(SignatureBlockFacts, OfACutBlockAreThoseBeforeTheCut) {
+TEST(SignatureBlockFacts, AreNotWholeForACutBlock) {
   const Bytes der = SignatureBlock().Build(kSignatureFile);
   for (size_t size = 0; size < der.size(); ++size) {
     const Bytes cut(der.begin(), der.begin() + static_cast<ptrdiff_t>(size));
@@ -103,7 +103,7 @@ TEST(SignatureBlockFacts, OfACutBlockAreThoseBeforeTheCut) {
   }
 }
 
-TEST(SignatureBlockFacts, OfABlockWithoutSignersAreNotWhole) {
+TEST(SignatureBlockFacts, AreNotWholeForABlockWithoutSigners) {
   SignatureBlock block;
   block.signer_infos = der::Set({});
   const Bytes der = block.Build(kSignatureFile);

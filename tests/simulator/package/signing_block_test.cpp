@@ -40,10 +40,10 @@ TEST(SigningBlock, EachSchemeHasItsSigners) {
   EXPECT_EQ(Read(block), Lines({"v2 CERT", "v3 A", "v3 B", "v3.1 CERT"}));
 }
 
-TEST(SigningBlock, NothingIsNoBlock) { EXPECT_EQ(Read({}), Lines()); }
+TEST(SigningBlock, EmptyInputHasNoSignersAndNoDamage) { EXPECT_EQ(Read({}), Lines()); }
 
 // The platform uses the first value of a scheme, and ignores other values of the same scheme.
-TEST(SigningBlock, OfTwoValuesForASchemeTheFirstCounts) {
+TEST(SigningBlock, FirstOfTwoValuesForASchemeCounts) {
   const Bytes own = Signers({SignerBytes(ToBytes("OWN"))});
   const Bytes other = Signers({SignerBytes(ToBytes("OTHER"))});
   EXPECT_EQ(Read(SigningBlockBytes({{kSchemeV2, own}, {kSchemeV2, other}, {kSchemeV3, other}})),
@@ -55,7 +55,7 @@ TEST(SigningBlock, SchemeWithoutSignersIsDamage) {
   EXPECT_EQ(Read(SigningBlockBytes({{kSchemeV2, Signers({})}})), Lines({"damaged"}));
 }
 
-TEST(SigningBlock, WithoutAKnownSchemeHasNoSigners) {
+TEST(SigningBlock, HasNoSignersWithoutAKnownScheme) {
   EXPECT_EQ(Read(SigningBlockBytes({{7, ToBytes("whatever")}})), Lines());
   EXPECT_EQ(Read(SigningBlockBytes({})), Lines());
 }
@@ -83,7 +83,7 @@ TEST(SigningBlock, LengthsThatReachTooFarAreDamage) {
   EXPECT_EQ(Read(block), Lines({"damaged"}));
 }
 
-TEST(SigningBlock, SignersBeyondReasonAreNotRead) {
+TEST(SigningBlock, SignersAfterThe16thAreNotRead) {
   const std::vector<Bytes> many(17, kSigner);
   EXPECT_EQ(Read(SigningBlockBytes({{kSchemeV2, Signers(many)}})).size(), 17U);
   EXPECT_EQ(Read(SigningBlockBytes({{kSchemeV2, Signers(many)}})).back(), "damaged");
@@ -118,7 +118,7 @@ TEST(ReadSigningBlock, FindsItBeforeTheCentralDirectory) {
   EXPECT_EQ(ReadFrom(block, "a comment with PK in it"), View(block));
 }
 
-TEST(ReadSigningBlock, ThereIsNoneWithoutMagicOrRoom) {
+TEST(ReadSigningBlock, FindsNothingWithoutMagicOrRoom) {
   Bytes block = SigningBlockBytes({{kSchemeV2, Signers({kSigner})}});
   EXPECT_EQ(ReadFrom({}), "");
   Bytes other = block;
@@ -133,13 +133,13 @@ TEST(ReadSigningBlock, ThereIsNoneWithoutMagicOrRoom) {
 }
 
 // The platform accepts a block only if it has the same size at its start and at its end.
-TEST(ReadSigningBlock, ThereIsNoneWhereTheTwoSizesDiffer) {
+TEST(ReadSigningBlock, FindsNothingIfTheTwoSizesDiffer) {
   Bytes block = SigningBlockBytes({{kSchemeV2, Signers({kSigner})}});
   ++block[0];
   EXPECT_EQ(ReadFrom(block), "");
 }
 
-TEST(ReadSigningBlock, LargestThatIsReadHasSixteenMebibytes) {
+TEST(ReadSigningBlock, ReadsBlocksOfAtMost16Mebibytes) {
   const Bytes largest = BlockOfSize(kMostBlockBytes);
   EXPECT_EQ(ReadFrom(largest), View(largest));
   EXPECT_EQ(ReadFrom(BlockOfSize(kMostBlockBytes + 1), "", true), "");

@@ -16,7 +16,7 @@ Json IntegrityEvent(int pid, const Json& text) {
 
 }  // namespace
 
-TEST(IntegrityFile, EveryWayOfOpeningFindsIt) {
+TEST(IntegrityFile, IsOpenedByFopenAndFopen64) {
   const Lines ways = {"fopen " + kOwn + " r", "fopen64 " + kOwn + " re"};
   const ProbeRun run = Probe(ways).Run();
   EXPECT_EQ(run.results, Lines(ways.size(), kHealthy));
@@ -24,7 +24,7 @@ TEST(IntegrityFile, EveryWayOfOpeningFindsIt) {
             std::vector<Json>(ways.size(), IntegrityEvent(0, "1f")));
 }
 
-TEST(IntegrityFile, EachOpeningAnswersTheNextValueAndTheLastRepeats) {
+TEST(IntegrityFile, EachOpeningReadsTheNextValueAndRepeatsTheLast) {
   const ProbeRun run =
       Probe(Lines(4, "fopen " + kOwn + " r")).Run({"--integrity", "ffffffff,2e,0"});
   EXPECT_EQ(run.results, Lines({"4294967295 77", "46 77", "0 77", "0 77"}));
@@ -33,7 +33,7 @@ TEST(IntegrityFile, EachOpeningAnswersTheNextValueAndTheLastRepeats) {
                                IntegrityEvent(0, "0"), IntegrityEvent(0, "0")}));
 }
 
-TEST(IntegrityFile, MissingIsNoFile) {
+TEST(IntegrityFile, DoesNotExistForTheValueMissing) {
   const ProbeRun run =
       Probe(Lines(3, "fopen " + kOwn + " r")).Run({"--integrity", "missing,1f,missing"});
   EXPECT_EQ(run.results, Lines({kNoFile, kHealthy, kNoFile}));
@@ -59,7 +59,7 @@ TEST(IntegrityFile, MayBeEmpty) {
   EXPECT_EQ(OfKind(run.events, "integrity"), std::vector<Json>({IntegrityEvent(0, "")}));
 }
 
-TEST(IntegrityFile, OfANumberedTask) {
+TEST(IntegrityFile, ExistsUnderTheNumberOfATask) {
   const ProbeRun run = Probe({"own-task", "fopen /proc/1/integrity/value r"}).Run();
   EXPECT_EQ(run.results, Lines({kHealthy, kHealthy}));
   const std::vector<Json> events = OfKind(run.events, "integrity");
@@ -68,13 +68,13 @@ TEST(IntegrityFile, OfANumberedTask) {
   EXPECT_EQ(events[1], IntegrityEvent(1, "1f"));
 }
 
-TEST(IntegrityFile, OfATaskThatDoesNotExistIsMissing) {
+TEST(IntegrityFile, IsMissingForATaskThatDoesNotExist) {
   const ProbeRun run = Probe({"fopen /proc/2147483647/integrity/value r"}).Run();
   EXPECT_EQ(run.results, Lines({kNoFile}));
   EXPECT_EQ(OfKind(run.events, "integrity").size(), 0U);
 }
 
-TEST(IntegrityFile, OnlyThatNameIsSimulated) {
+TEST(IntegrityFile, OtherNamesAreNotSimulated) {
   const Lines names = {"/proc/self/integrity/label",      "/proc/self/integrity/value/",
                        "/proc/self/integrity/values",     "/proc/self/integrity",
                        "/proc/1x/integrity/value",        "/proc/01/integrity/value",
@@ -96,7 +96,7 @@ TEST(IntegrityFile, CannotBeWritten) {
   EXPECT_EQ(run.results, Lines({refusal, refusal, "-1 " + std::to_string(EPERM), kHealthy}));
 }
 
-TEST(IntegrityFile, IsTheLowestFreeDescriptor) {
+TEST(IntegrityFile, GetsTheLowestFreeDescriptor) {
   EXPECT_EQ(Probe(Lines(2, "keep " + kOwn)).Run().results, Lines({"5 77", "6 77"}));
 }
 

@@ -25,7 +25,7 @@ TEST(JournalEvent, IsOneLineOfJson) {
   unlink(path);
 }
 
-TEST(JournalEvent, ThatCannotBeWrittenIsReported) { EXPECT_FALSE(Event("journal").AppendTo(-1)); }
+TEST(JournalEvent, WriteFailureIsReported) { EXPECT_FALSE(Event("journal").AppendTo(-1)); }
 
 TEST(JournalDescriptor, IsHighAndClosedByExec) {
   const int low = dup(0);
@@ -38,6 +38,6 @@ TEST(JournalDescriptor, IsHighAndClosedByExec) {
   for (const int fd : {low, journal, next}) close(fd);
 }
 
-TEST(JournalDescriptor, OfAFileThatCannotBeOpenedIsMinusOne) {
+TEST(JournalDescriptor, IsMinusOneForAFileThatCannotBeOpened) {
   EXPECT_EQ(OpenJournal("/nowhere/journal"), -1);
 }

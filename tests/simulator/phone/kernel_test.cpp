@@ -37,13 +37,13 @@ TEST(KernelSign, SucceedsAndLeavesErrnoAlone) {
                                SignEvent(3, probe.path(), "0000", 0)}));
 }
 
-TEST(KernelSign, TakesAsManyBytesAsTheLengthSays) {
+TEST(KernelSign, ReadsAsManyBytesAsTheLengthSays) {
   const Probe probe({"sign 3 0100abcdef"});
   EXPECT_EQ(OfKind(probe.Run().events, "sign"),
             std::vector<Json>({SignEvent(3, probe.path(), "0100ab", 0)}));
 }
 
-TEST(KernelSign, TakesTheLongestPayload) {
+TEST(KernelSign, AcceptsTheLongestPayload) {
   std::string payload = "ffff";
   for (int i = 0; i < 0xffff; ++i) payload += "5a";
   const Probe probe({"sign 3 " + payload});
@@ -142,7 +142,7 @@ TEST(KernelFcntl, OtherCommandsGoToTheRealKernel) {
   EXPECT_EQ(run.events.size(), 1U);  // the event "exit"
 }
 
-TEST(KernelStandIn, KeepsItsDescriptorsHighAndToItself) {
+TEST(KernelStandIn, HidesItsDescriptorsFromTheTool) {
   const Probe probe({"open /", "sign 3 0000", "register 3 name ab", "log 4 tag 61",
                      "fopen /proc/self/integrity/value r", "open /", "inherited"});
   const ProbeRun run = probe.Run();
@@ -178,7 +178,7 @@ TEST(KernelStandIn, RecordsWhenNoDescriptorIsLeft) {
   EXPECT_EQ(OfKind(run.events, "sign").size(), 1U);
 }
 
-TEST(KernelStandIn, TakesThePreloadOutOfTheEnvironment) {
+TEST(KernelStandIn, RemovesThePreloadFromTheEnvironment) {
   EXPECT_EQ(Probe({"has-variable LD_PRELOAD", "has-variable PATH"}).Run().results,
             Lines({"0 77", "1 77"}));
 }

@@ -3,7 +3,7 @@
 #include "simulator/phone/probe_run.h"
 #include "support/process.h"
 
-TEST(Libzu, RegistersAndLeavesErrnoAlone) {
+TEST(LibzuStandIn, RegistersAndLeavesErrnoAlone) {
   const Probe probe({"register 3 com.example.app 00ffa5"});
   const ProbeRun run = probe.Run();
   EXPECT_EQ(run.results, Lines({"0 77"}));
@@ -15,7 +15,7 @@ TEST(Libzu, RegistersAndLeavesErrnoAlone) {
                                                                 {"result", 0}}}));
 }
 
-TEST(Libzu, AnswersWhatThePhoneSays) {
+TEST(LibzuStandIn, AnswersWhatThePhoneSays) {
   for (const std::string result : {"65540", "-7", "2147483647", "-2147483648"}) {
     const ProbeRun run = Probe({"register 3 name ab"}).Run({"--zu-result", result});
     EXPECT_EQ(run.results, Lines({result + " 77"}));
@@ -23,13 +23,13 @@ TEST(Libzu, AnswersWhatThePhoneSays) {
   }
 }
 
-TEST(Libzu, RecordsADescriptorThatIsNotOpen) {
+TEST(LibzuStandIn, RecordsADescriptorThatIsNotOpen) {
   const ProbeRun run = Probe({"register 700 name ab"}).Run();
   EXPECT_EQ(run.results, Lines({"0 77"}));
   EXPECT_EQ(OfKind(run.events, "register")[0]["path"], "");
 }
 
-TEST(Libzu, WithoutAPhoneThereIsNoService) {
+TEST(LibzuStandIn, ReturnsMinusOneWithoutAPhone) {
   const Probe probe({"register 3 name ab"});
   const ProcessResult result = RunProcess({PROBE_COMMAND, probe.path()});
   EXPECT_EQ(result.output + result.errors, "");

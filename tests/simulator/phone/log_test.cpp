@@ -36,12 +36,12 @@ TEST(Log, KeepsWhatThePlatformsLibrariesWriteByThemselves) {
   EXPECT_EQ(run.errors, "");
 }
 
-TEST(Log, TextsAreBytes) {
+TEST(Log, BytesThatAreNotUtf8AreKept) {
   EXPECT_EQ(OfKind(Probe({"log 4 tag e9c3a9ff"}).Run().events, "log"),
             std::vector<Json>({LogEvent(4, "tag", "\uf7e9\u00e9\uf7ff|5\n")}));
 }
 
-TEST(Log, CutsWhatIsLongerThanARecord) {
+TEST(Log, CutsTextsTo1023Bytes) {
   const std::string long_text = Repeated("61", 2000);
   const std::vector<Json> kept(2, LogEvent(4, "tag", Repeated("a", 1023)));
   EXPECT_EQ(

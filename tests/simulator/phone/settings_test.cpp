@@ -30,7 +30,7 @@ class Environment {
 
 }  // namespace
 
-TEST(PhoneEnvironment, WithoutVariablesThePhoneIsHealthy) {
+TEST(PhoneEnvironment, PhoneIsHealthyWithoutVariables) {
   const PhoneSettings phone = SettingsFromEnvironment();
   EXPECT_EQ(phone.journal, "");
   EXPECT_EQ(phone.integrity, Lines({"1f"}));
@@ -55,7 +55,7 @@ TEST(PhoneEnvironment, EverySettingArrives) {
 }
 
 // A text without an inode number becomes {0, 0}. No file has the inode 0.
-TEST(PhoneEnvironment, FileThatIsNotNamedByDeviceAndInodeIsNone) {
+TEST(PhoneEnvironment, TrustedFileWithoutAnInodeIsReadAsZero) {
   const Environment environment({"APKTOOLKIT_SIM_TRUST=5,6:7"});
   EXPECT_EQ(SettingsFromEnvironment().trusted, std::vector<FileId>({{0, 0}, {6, 7}}));
 }

@@ -28,7 +28,7 @@ TEST(StandardOutput, PiecesOfALineAreOneEvent) {
   EXPECT_EQ(run.events[1], Printed("c"));  // recorded when the process ends
 }
 
-TEST(StandardOutput, TextsAreBytes) {
+TEST(StandardOutput, BytesThatAreNotUtf8AreKept) {
   EXPECT_EQ(OfKind(Probe({"print e90a"}).Run().events, "stdout"),
             std::vector<Json>({Printed("\uf7e9\n")}));
 }

@@ -68,7 +68,7 @@ TEST(JournalText, BytesThatAreNoUtf8BecomePrivateCharacters) {
   EXPECT_EQ(EncodeText("\xf5\x80\x80\x80"), R"("\uf7f5\uf780\uf780\uf780")");
 }
 
-TEST(JournalText, ThePrivateCharactersThemselvesAreWrittenByteByByte) {
+TEST(JournalText, PrivateCharactersAreWrittenByteByByte) {
   EXPECT_EQ(EncodeText("\uf780"), R"("\uf7ef\uf79e\uf780")");
   EXPECT_EQ(EncodeText("\uf7ff"), R"("\uf7ef\uf79f\uf7bf")");
 }

@@ -12,20 +12,20 @@ using Json = nlohmann::json;
 
 }  // namespace
 
-TEST(Events, AreTheObjectsOfTheLines) {
+TEST(Events, AreTheLinesWithJsonObjects) {
   const Events events = ParseEvents("{\"event\":\"a\"}\nno JSON\n[1]\n{\"event\":\"b\"}\n{\"event");
   ASSERT_EQ(events.size(), 2U);
   EXPECT_EQ(TextOf(events[0], "event"), "a");
   EXPECT_EQ(TextOf(events[1], "event"), "b");
 }
 
-TEST(Events, TextsAreTheBytesThatTheyWere) {
+TEST(Events, TextsAreDecodedToTheirBytes) {
   EXPECT_EQ(TextOf(Json::parse(R"({"a":"x\uf7e9"})"), "a"), "x\xe9");
   EXPECT_EQ(TextOf(Json::parse(R"({"a":5})"), "a"), "");
   EXPECT_EQ(TextOf(Json::parse(R"({"a":"x"})"), "b"), "");
 }
 
-TEST(Events, NumbersAreWholeOrNotThere) {
+TEST(Events, NumbersAreWholeOrZero) {
   EXPECT_EQ(NumberOf(Json::parse(R"({"a":-7})"), "a"), -7);
   EXPECT_EQ(NumberOf(Json::parse(R"({"a":"7"})"), "a"), 0);
   EXPECT_EQ(NumberOf(Json::parse(R"({"a":7.5})"), "a"), 0);
@@ -41,7 +41,7 @@ TEST(Events, SuccessIsTheResultZero) {
   EXPECT_FALSE(IsSuccess(Json::parse(R"({})")));
 }
 
-TEST(Events, OfTheRunAreAllButTheJournalsOwn) {
+TEST(Events, AllButTheJournalsOwnBelongToTheRun) {
   for (const char* kind : {"journal", "start", "attached", "verdict"}) {
     EXPECT_FALSE(IsOfTheRun({{"event", kind}})) << kind;
   }

@@ -38,7 +38,7 @@ FileListOptions Recursive(const Lines& names) { return {names, "", false, true};
 
 }  // namespace
 
-TEST(PackageName, EndsWithAPackagesEndingInAnyCase) {
+TEST(PackageName, HasAPackageEndingInAnyLetterCase) {
   for (const char* name : {"a.apk", "a.APK", "b.jar", "c.apks", "d.xapk", "e.apkm", "f.Aab"}) {
     EXPECT_TRUE(IsPackageName(name)) << name;
   }
@@ -47,14 +47,14 @@ TEST(PackageName, EndsWithAPackagesEndingInAnyCase) {
   }
 }
 
-TEST(FileList, WithoutOptionsIsWhatWasNamed) {
+TEST(FileList, HasTheNamedFilesWithoutOptions) {
   const TempDir directory;
   directory.Write("b/a.apk", {});
   EXPECT_EQ(Listed(directory, {{directory / "b", "none", directory / "b"}, "", false, false}),
             Lines({"b", "none", "b"}));
 }
 
-TEST(FileList, DirectoryStandsForThePackagesBelowItSortedByPath) {
+TEST(FileList, DirectoryIsReplacedByItsPackagesSortedByPath) {
   const TempDir directory;
   for (const char* name : {"s/b/z.apk", "s/b/a.JAR", "s/a.xapk", "s/b.apk", "s/.hidden/c.aab",
                            "s/notes.txt", "s/b/x.zip"}) {
@@ -79,7 +79,7 @@ TEST(FileList, LinksToDirectoriesAreFollowedOnlyIfNamed) {
             Lines({"named/a.apk", "named/b.apk", "named/c.apk"}));
 }
 
-TEST(FileList, DirectoryWithoutPackagesIsTold) {
+TEST(FileList, DirectoryWithoutPackagesIsReported) {
   const TempDir directory;
   directory.Write("empty/readme.txt", {});
   directory.Write("full/a.apk", {});
@@ -88,7 +88,7 @@ TEST(FileList, DirectoryWithoutPackagesIsTold) {
 }
 
 // A path has at most 4095 bytes. The first directory with a longer path cannot be read.
-TEST(FileList, DirectoryThatCannotBeReadIsTold) {
+TEST(FileList, DirectoryThatCannotBeReadIsReported) {
   const TempDir directory;
   directory.Write("deep/a.apk", {});
   const std::string name(250, 'd');
@@ -119,7 +119,7 @@ TEST(FileList, ListsAreReadByLinesOrByNulBytes) {
       Lines({"the list " + nul + " contains NUL bytes; use -0 if its names end with NUL bytes"}));
 }
 
-TEST(FileList, DirectoriesOfAListAreWalkedToo) {
+TEST(FileList, DirectoriesInAListAreSearchedToo) {
   const TempDir directory;
   directory.Write("s/a.apk", {});
   const std::string list = directory.Write("list", ToBytes((directory / "s") + "\n"));
@@ -128,7 +128,7 @@ TEST(FileList, DirectoriesOfAListAreWalkedToo) {
 }
 
 // A list without names is an error, even if the command line names files.
-TEST(FileList, ListThatNamesNothingIsNone) {
+TEST(FileList, ListWithoutNamesIsAnError) {
   const TempDir directory;
   for (const char* content : {"", "\n\n"}) {
     const std::string list = directory.Write("list", ToBytes(content));
@@ -137,7 +137,7 @@ TEST(FileList, ListThatNamesNothingIsNone) {
   }
 }
 
-TEST(FileList, ListThatCannotBeReadIsNone) {
+TEST(FileList, ListThatCannotBeReadIsAnError) {
   const TempDir directory;
   EXPECT_EQ(
       Listed(directory, {{}, directory / "none", false, false}),

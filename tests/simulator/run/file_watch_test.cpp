@@ -77,7 +77,7 @@ TEST(FileWatch, ChangeOfTheInodeAloneCountsIfTheBytesDiffer) {
   EXPECT_TRUE(IsNoticed([](const std::string& file) { ChangeTheInodeAlone(file, "abc"); }, ""));
 }
 
-TEST(FileWatch, LeavesARunAloneThatHasNoResultOrNoFile) {
+TEST(FileWatch, DoesNotChangeARunWithoutResultOrFile) {
   const TempDir directory;
   const std::string file = directory.Write("file", ToBytes("abc"));
   FileRun run;

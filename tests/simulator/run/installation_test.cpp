@@ -60,12 +60,12 @@ const std::vector<ZipItem> kBoth = {{"lib/arm64-v8a/liba.so", ToBytes("64")},
 
 }  // namespace
 
-TEST(Installation, OfAPhoneHasTheLibrariesOfItsOwnProcessor) {
+TEST(Installation, HasTheLibrariesOfThePreferredProcessor) {
   EXPECT_EQ(LaidOut(kBoth, InstalledAbi::kPreferred), Files({"lib/arm64/liba.so 64"}));
   EXPECT_EQ(LaidOut({kBoth[1], kBoth[3]}, InstalledAbi::kPreferred), Files({"lib/arm/liba.so 32"}));
 }
 
-TEST(Installation, TakesTheProcessorsThatAreAskedFor) {
+TEST(Installation, HasTheLibrariesOfTheChosenProcessors) {
   EXPECT_EQ(LaidOut(kBoth, InstalledAbi::kAll),
             Files({"lib/arm/liba.so 32", "lib/arm64/liba.so 64"}));
   EXPECT_EQ(LaidOut(kBoth, InstalledAbi::kArm64), Files({"lib/arm64/liba.so 64"}));
@@ -77,7 +77,7 @@ TEST(Installation, TakesTheProcessorsThatAreAskedFor) {
             Files({"lib/arm/liba.so 32"}));
 }
 
-TEST(Installation, WithoutLibrariesToLayOutThePackageStaysWhereItIs) {
+TEST(Installation, PackageWithoutLibrariesForTheAbiStaysWhereItIs) {
   EXPECT_EQ(LaidOut({kBoth[3]}, InstalledAbi::kPreferred), Files());
   EXPECT_EQ(LaidOut({kBoth[0]}, InstalledAbi::kArm), Files());
   EXPECT_EQ(LaidOut({}, InstalledAbi::kAll), Files());
@@ -124,7 +124,7 @@ TEST(Installation, NamesThatNoFileCanHaveAreLeftOut) {
 }
 
 // Cuts the file at different times, until one cut happens while the libraries are extracted.
-TEST(Installation, OfAFileThatShrinksMeanwhileIsNone) {
+TEST(Installation, FailsIfTheFileShrinksDuringExtraction) {
   std::vector<ZipItem> libraries;
   for (int i = 0; i < 1000; ++i) {
     libraries.push_back({"lib/arm64-v8a/" + std::to_string(i) + ".so", {}});
@@ -146,7 +146,7 @@ TEST(Installation, OfAFileThatShrinksMeanwhileIsNone) {
   EXPECT_TRUE(is_told);
 }
 
-TEST(Installation, TellsWhatCannotBeExtracted) {
+TEST(Installation, NamesTheLibrariesThatCannotBeExtracted) {
   ZipItem undeflatable = {"lib/arm64-v8a/libdata.so", ToBytes("data")};
   undeflatable.deflated = true;
   undeflatable.raw = ToBytes("no deflate stream");
@@ -173,7 +173,7 @@ TEST(Installation, TellsWhatCannotBeExtracted) {
 }
 
 // The copy is named base.apk, so it cannot collide with the directory lib beside it.
-TEST(Installation, OfAFileThatIsCalledAsALibrarysDirectory) {
+TEST(Installation, PackageNamedLibBecomesBaseApk) {
   const TempDir directory;
   const std::string file = directory / "lib";
   MakePackage().WriteTo(file);
@@ -210,7 +210,7 @@ TEST(Installation, SaysWhenItCannotWrite) {
 
 // A lease (F_SETLEASE) delays every other open() of the file. The installation does not wait for
 // the end of the lease. The tool waits, and the report then names the lease.
-TEST(Installation, DoesNotWaitForWhoHoldsALease) {
+TEST(Installation, DoesNotWaitForALease) {
   const TempDir directory;
   const std::string file = directory / "base.apk";
   MakePackage().WriteTo(file);
@@ -224,7 +224,7 @@ TEST(Installation, DoesNotWaitForWhoHoldsALease) {
   close(holder);
 }
 
-TEST(Installation, IsGoneWithItsOwner) {
+TEST(Installation, DisappearsWithItsOwner) {
   const TempDir directory;
   const std::string file = directory / "base.apk";
   MakePackage().WriteTo(file);
@@ -243,7 +243,7 @@ TEST(Installation, IsGoneWithItsOwner) {
 
 // A hard link to a file in memory (memfd) is impossible, like a hard link to a file on another file
 // system. The package is therefore copied.
-TEST(Installation, OfAFileThatCannotBeLinkedIsACopyAndNotForEver) {
+TEST(Installation, FileThatCannotBeLinkedIsCopiedBeforeTheDeadline) {
   const TempDir directory;
   MakePackage(WithLibraries({{"lib/arm64-v8a/liba.so", Bytes(3 << 20, 'a')}}))
       .WriteTo(directory / "base.apk");
@@ -276,7 +276,7 @@ TEST(Installation, LeavesOtherFilesWhereTheyAre) {
   }
 }
 
-TEST(Installation, SaysWhenThereIsNoPlaceForIt) {
+TEST(Installation, ReportsAMissingTemporaryDirectory) {
   const TempDir directory;
   const std::string file = directory / "base.apk";
   MakePackage().WriteTo(file);
@@ -291,7 +291,7 @@ TEST(Installation, SaysWhenThereIsNoPlaceForIt) {
 }
 
 // An interruption ends the installation at once, even if time is left.
-TEST(Installation, EndsWhenTheProcessIsToEnd) {
+TEST(Installation, FailsAfterAnInterruption) {
   const TempDir directory;
   const std::string file = directory / "base.apk";
   MakePackage(WithLibraries({kBoth[0]})).WriteTo(file);
@@ -307,7 +307,7 @@ TEST(Installation, EndsWhenTheProcessIsToEnd) {
 
 // ---- A package without libraries beside it.
 
-TEST(Installation, IsMadeOfAPackageThatLiesAlone) {
+TEST(Installation, IsMadeForAPackageWithoutLibrariesBesideIt) {
   const TempDir directory;
   const std::string file = directory / "base.apk";
   // The tool looks for a library of this ABI in lib/armX.

@@ -15,7 +15,7 @@ struct Row {
 
 }  // namespace
 
-TEST(LogLine, EachTextHasItsMeaningAndWhatIsCaptured) {
+TEST(ToolLogLine, EachTextHasItsMeaningAndWhatIsCaptured) {
   const Row rows[] = {
       {"VeltSignJni starts: 3.\n", LogMeaning::kLibrariesBegin, "", 0},
       {"VeltSign starts: zip_fd = 3, fd = 3.\n", LogMeaning::kFileBegins, "", 0},
@@ -73,7 +73,7 @@ TEST(LogLine, EachTextHasItsMeaningAndWhatIsCaptured) {
   }
 }
 
-TEST(LogLine, OtherTextsAreUnknown) {
+TEST(ToolLogLine, OtherTextsAreUnknown) {
   for (const char* text :
        {"", "\n", "something new", "VeltSignJni starts: x.\n", "VeltSignJni starts: 3. And more.\n",
         " VeltSignOat: Apk case.\n", "VeltSignOat: Apk case.", "RSA could not set key: G\n",
@@ -83,7 +83,7 @@ TEST(LogLine, OtherTextsAreUnknown) {
 }
 
 // The author of a file chooses the names in it, so a name can contain the text of a log line.
-TEST(LogLine, TextInANameMakesNoOtherLine) {
+TEST(ToolLogLine, NameWithLogTextDoesNotChangeTheMeaning) {
   const LogLine path =
       ReadLogLine("OpenArchiveFd(3) [file: /a] returned: -6: x\n] returned: -3: Invalid file\n");
   EXPECT_EQ(path.number, -3);
@@ -94,7 +94,7 @@ TEST(LogLine, TextInANameMakesNoOtherLine) {
 }
 
 // The log keeps 1023 bytes of a text.
-TEST(LogLine, TextThatWasCutIsKnownByItsStart) {
+TEST(ToolLogLine, TextThatWasCutIsKnownByItsStart) {
   const std::string start = "VeltSignJni: File not verified: ";
   const std::string cut = start + std::string(1023 - start.size(), 'x');
   EXPECT_EQ(ReadLogLine(cut).meaning, LogMeaning::kLibraryRefused);
@@ -103,13 +103,13 @@ TEST(LogLine, TextThatWasCutIsKnownByItsStart) {
   EXPECT_EQ(ReadLogLine(std::string(1023, 'x')).meaning, LogMeaning::kUnknown);
 }
 
-TEST(LogLine, WholeTextLosesItsLastLineEnd) {
+TEST(ToolLogLine, WholeTextLosesItsLastLineEnd) {
   EXPECT_EQ(ReadLogLine("a\n\n").whole, "a\n");
   EXPECT_EQ(ReadLogLine("a").whole, "a");
   EXPECT_EQ(ReadLogLine("").whole, "");
 }
 
-TEST(FindError, IsTheFirstOfTheMeaning) {
+TEST(FindLogLine, ReturnsTheFirstLineWithTheMeaning) {
   const std::vector<LogLine> lines = {ReadLogLine("RSA could not set key: 5\n"),
                                       ReadLogLine("RSA could not set key: 9\n")};
   EXPECT_EQ(FindError(lines, LogMeaning::kKeyRefused), lines.data());

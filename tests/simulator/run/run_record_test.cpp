@@ -47,12 +47,12 @@ Lines SignedBy(const Events& events) {
 }  // namespace
 
 // The step counts more than the path, because the file may have been moved during the run.
-TEST(RunRecord, WhileTheToolSignsTheFileItselfEverythingIsIts) {
+TEST(RunRecord, StepOfTheToolCountsMoreThanThePath) {
   EXPECT_EQ(SignedBy({kFileBegins, Sign("/data/app/moved.apk")}), Lines({"own"}));
   EXPECT_EQ(SignedBy({Log("VeltSignJni starts: 3.\n"), Sign(kFile)}), Lines({kFile}));
 }
 
-TEST(RunRecord, BeforeAndAfterThePathTells) {
+TEST(RunRecord, PathDecidesBeforeAndAfterTheStep) {
   EXPECT_EQ(SignedBy({Sign(kFile)}), Lines({"own"}));
   EXPECT_EQ(SignedBy({Sign("")}), Lines({"own"}));
   EXPECT_EQ(SignedBy({Sign("/other")}), Lines({"/other"}));
@@ -60,7 +60,7 @@ TEST(RunRecord, BeforeAndAfterThePathTells) {
   EXPECT_EQ(SignedBy({kFileBegins, kFileEnds, Sign("/other")}), Lines({"/other"}));
 }
 
-TEST(RunRecord, OnlyTheFileItselfIsVerified) {
+TEST(RunRecord, VerificationCountsOnlyForTheFileItself) {
   EXPECT_TRUE(Record({Verify(kFile)}).is_jar);
   EXPECT_EQ(Record({Verify(kFile)}).verify_error, 126);
   EXPECT_FALSE(Record({Verify("/other")}).is_jar);

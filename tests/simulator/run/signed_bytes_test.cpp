@@ -36,7 +36,7 @@ TEST(SignedBytes, AreTrustedUnderAnyNameWhileTheyStayTheSame) {
   EXPECT_FALSE(bytes.Holds(file, kLater));
 }
 
-TEST(SignedBytes, OfTheSameFileAreTrustedUnlessItWasTouched) {
+TEST(SignedBytes, AreTrustedWithoutReadingIfTheFileIsUnchanged) {
   const TempDir directory;
   const std::string file = directory.Write("file", ToBytes("abc"));
   SignedBytes bytes("", true);
@@ -48,7 +48,7 @@ TEST(SignedBytes, OfTheSameFileAreTrustedUnlessItWasTouched) {
 }
 
 // The size and the mtime are the same, and only the ctime differs.
-TEST(SignedBytes, ThatWereChangedWithoutASignInTheirTimeAreNotTrusted) {
+TEST(SignedBytes, AreNotTrustedIfChangedWithTheSameMtime) {
   const TempDir directory;
   const std::string file = directory.Write("file", ToBytes("abc"));
   struct stat before = {};
@@ -62,7 +62,7 @@ TEST(SignedBytes, ThatWereChangedWithoutASignInTheirTimeAreNotTrusted) {
   EXPECT_FALSE(bytes.Holds(file, kLater));
 }
 
-TEST(SignedBytes, ThatCannotBeReadInTimeAreNotTrusted) {
+TEST(SignedBytes, AreNotTrustedIfTheyCannotBeReadInTime) {
   const TempDir directory;
   const std::string file = directory.Write("file", ToBytes("abc"));
   const std::string copy = directory.Write("copy", ToBytes("abc"));
@@ -73,7 +73,7 @@ TEST(SignedBytes, ThatCannotBeReadInTimeAreNotTrusted) {
   EXPECT_FALSE(kept.Add(file, kPassed));
 }
 
-TEST(SignedBytes, AreForLaterRunsAloneWhereTheFilesOfARunDoNotShareThem) {
+TEST(SignedBytes, AreTrustedOnlyInLaterRunsIfNotShared) {
   const TempDir directory;
   const std::string file = directory.Write("file", ToBytes("abc"));
   SignedBytes first(directory / "state", false);
@@ -86,7 +86,7 @@ TEST(SignedBytes, AreForLaterRunsAloneWhereTheFilesOfARunDoNotShareThem) {
 }
 
 // Reading a pipe would wait forever, and reading a device would never end.
-TEST(SignedBytes, OfPipesAndDevicesAreNotRead) {
+TEST(SignedBytes, AreNotReadFromPipesAndDevices) {
   const TempDir directory;
   const std::string pipe = directory / "pipe";
   ASSERT_EQ(mkfifo(pipe.c_str(), 0600), 0);
@@ -110,7 +110,7 @@ TEST(SignedBytes, AreKeptByTheirDigest) {
   EXPECT_TRUE(second.Holds(file, kLater));
 }
 
-TEST(SignedBytes, ThatAreNotSharedAreForLaterRunsAlone) {
+TEST(SignedBytes, AreNotTrustedInThisRunIfNotShared) {
   const TempDir directory;
   const std::string file = directory.Write("file", ToBytes("abc"));
   SignedBytes none("", false);
@@ -125,7 +125,7 @@ TEST(SignedBytes, ThatAreNotSharedAreForLaterRunsAlone) {
   EXPECT_TRUE(later.Holds(file, kLater));
 }
 
-TEST(SignedBytes, OfAFileThatCannotBeReadAreNeverTrusted) {
+TEST(SignedBytes, AreNotTrustedIfTheFileCannotBeRead) {
   const TempDir directory;
   SignedBytes bytes(directory / "state", true);
   ASSERT_TRUE(bytes.Load());

@@ -38,7 +38,7 @@ for element in tree.parse(sys.argv[1]).iter():
 
 }  // namespace
 
-TEST(Junit, BeginsAsALaterRunExpectsItOfWhatItReplaces) {
+TEST(Junit, BeginsAsALaterRunExpects) {
   EXPECT_EQ(XmlOf({}).substr(0, kJunitStart.size()), kJunitStart);
 }
 
@@ -113,7 +113,7 @@ TEST(Junit, OnlyWhatEndsWithStatusZeroPasses) {
   }
 }
 
-TEST(Junit, HostileTextsAreTexts) {
+TEST(Junit, HostileTextDoesNotBecomeMarkup) {
   const std::string read = ReadByPython(XmlOf({HostileReport(kHostileText)}));
   EXPECT_NE(read.find("</title></style><script>"), std::string::npos) << read;
   EXPECT_EQ(read.find("\nscript "), std::string::npos);
@@ -122,7 +122,7 @@ TEST(Junit, HostileTextsAreTexts) {
 
 // The text has all bytes except 0, all characters from U+0080 to U+FFFF, and a few above. Some of
 // them are characters that XML does not allow (XML 1.0 §2.2).
-TEST(Junit, EveryCharacterMakesAWholeDocument) {
+TEST(Junit, EveryCharacterGivesAWellFormedDocument) {
   std::string text;
   for (int byte = 1; byte < 256; ++byte) text += static_cast<char>(byte);
   const auto add = [&text](uint32_t code) {

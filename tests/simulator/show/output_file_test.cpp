@@ -35,14 +35,14 @@ TEST(OutputFile, ReplacesAnEarlierOne) {
   EXPECT_EQ(ContentOf(path), "a\nb\n");
 }
 
-TEST(OutputFile, ReplacesWhatIsEmptyOrNotThereOrNoFile) {
+TEST(OutputFile, AcceptsAnEmptyOrMissingFileOrADevice) {
   const TempDir directory;
   EXPECT_EQ(Objection(directory.Write("empty", {})), std::nullopt);
   EXPECT_EQ(Objection(directory / "none"), std::nullopt);
   EXPECT_EQ(Objection("/dev/null"), std::nullopt);
 }
 
-TEST(OutputFile, LeavesAnythingElseAlone) {
+TEST(OutputFile, ObjectsToAFileOfAnotherKind) {
   const TempDir directory;
   for (const char* content : {"PK\3\4 and more than a list begins with", "list", " list:"}) {
     const std::string path = directory.Write("base.apk", ToBytes(content));
@@ -52,7 +52,7 @@ TEST(OutputFile, LeavesAnythingElseAlone) {
   }
 }
 
-TEST(OutputFile, LeavesAFileThatIsLookedAtAloneUnderAnyName) {
+TEST(OutputFile, ObjectsToAnInputUnderAnyName) {
   const TempDir directory;
   const std::string path = directory.Write("list", ToBytes("list:"));
   const std::string link = directory / "link";
@@ -93,7 +93,7 @@ TEST(OutputFile, SaysThatItCannotBeWritten) {
   EXPECT_EQ(errno, ENOSPC);
 }
 
-TEST(OutputFile, WithoutANameIsNotWanted) {
+TEST(OutputFile, IsNotWantedWithoutAName) {
   OutputFile file(kList, "");
   EXPECT_FALSE(file.IsWanted());
   EXPECT_EQ(file.Objection({""}), std::nullopt);

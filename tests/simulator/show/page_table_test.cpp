@@ -62,13 +62,13 @@ TEST(PageTable, HasTheWorstFirst) {
                              "SIGNED, OTHER SIGNER|c", "SIGNED|b", "TRUSTED JAR|a"}));
 }
 
-TEST(PageTable, HasMoreWarningsFirstAndElseTheOrderOfTheCommandLine) {
+TEST(PageTable, SortsByWarningsAndThenByTheCommandLine) {
   EXPECT_EQ(RowsOf({Example("a", Verdict::kSigned), Example("b", Verdict::kSigned, 1),
                     Example("c", Verdict::kSigned, 2), Example("d", Verdict::kSigned)}),
             (Lines{"SIGNED|c||2|||", "SIGNED|b||1|||", "SIGNED|a|||||", "SIGNED|d|||||"}));
 }
 
-TEST(PageTable, SaysWhyAndWhose) {
+TEST(PageTable, ShowsTheReasonAndTheSigner) {
   Report refused = Example("a", Verdict::kPartlySigned, 1);
   refused.package_name = "com.app";
   refused.items = {
@@ -86,7 +86,7 @@ TEST(PageTable, SaysWhyAndWhose) {
                    "another package name|1|com.good|CN=Vault, RSA-2048, key bbbbbbbb…bbbbbb|"}));
 }
 
-TEST(PageTable, SaysForWhomElsePhonesInstallIt) {
+TEST(PageTable, ShowsForWhichOtherSignerPhonesInstallIt) {
   Report report = Example("a", Verdict::kOtherSigner);
   report.key = {std::string(64, 'b'), 2048, true};
   CertificateFacts other;
@@ -99,7 +99,7 @@ TEST(PageTable, SaysForWhomElsePhonesInstallIt) {
             "bbbbbbbb…bbbbbb|");
 }
 
-TEST(PageTable, ShowsTheKeyBehindALongName) {
+TEST(PageTable, ShowsTheKeyAfterALongName) {
   Report report = Example("a", Verdict::kSigned);
   report.signer.emplace();
   report.signer->subject = std::string(1000, 'n');
@@ -135,7 +135,7 @@ TEST(PageTable, HasNoChoiceWhereAllFilesAreAlike) {
   EXPECT_EQ(PartOf(alike, "<fieldset", "</fieldset>"), "");
 }
 
-TEST(PageTable, TellsTheCommonDirectoryOnce) {
+TEST(PageTable, ShowsTheCommonDirectoryOnce) {
   const std::vector<Report> reports = {Example("/store/one/base.apk", Verdict::kSigned),
                                        Example("/store/two/base.apk", Verdict::kSigned)};
   EXPECT_EQ(PartOf(reports, "<caption>", "</caption>"),

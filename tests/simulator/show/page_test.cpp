@@ -55,7 +55,7 @@ Item Library(const std::string& name, const Cause* why) {
 
 }  // namespace
 
-TEST(Page, SaysWhatTheTerminalSays) {
+TEST(Page, ShowsVerdictItemsWarningsAndSigner) {
   Report report = Example(Verdict::kPartlySigned);
   report.package_name = "com.example.vault";
   report.items = {Library("lib/arm/a.so", nullptr),
@@ -113,7 +113,7 @@ TEST(Page, HasTheSameMarkupWhateverFilesAreCalled) {
                   "&amp;lt;&amp;{{verdict}}{{{verdict}}}{{&amp;verdict}}--&gt;"));
 }
 
-TEST(Page, ShowsAsBytesWhatIsNoTextOrTurnsIt) {
+TEST(Page, ShowsInvalidAndHiddenCharactersAsBytes) {
   std::string page = PageOf(HostileReport(kHostileText));
   EXPECT_TRUE(
       Has(page, "\\x1b]0;x\\x07\\x09\\x0a\\x0d\\x7f\\xff\\xc3\\xc2\\x9b\\xd8\\x9c\\xe2\\x80"));
@@ -141,7 +141,7 @@ TEST(Page, FillsInTheWholeTemplate) {
   EXPECT_TRUE(Has(page, "</html>\n"));
 }
 
-TEST(Page, IsBoundedHoweverMuchThereIs) {
+TEST(Page, StaysBelow2MebibytesForALargeReport) {
   constexpr size_t kMany = 60'000;
   const std::string name(1000, '"');
   Report report = Example(Verdict::kPartlySigned);
@@ -164,7 +164,7 @@ TEST(Page, IsBoundedHoweverMuchThereIs) {
       << "a refusal is not left out";
 }
 
-TEST(Page, ShowsAllOfWhatIsNotTooMuch) {
+TEST(Page, ShowsEverythingUpToTheLimits) {
   Report report = Example(Verdict::kSigned);
   report.items.assign(kMostPageLines, Library("a", nullptr));
   report.items.back() = Library(std::string(kMostPageText, 'b'), &cause::kLibraryChanged);
@@ -199,7 +199,7 @@ TEST(Page, HasATableOfFilesWhereThereAreSeveral) {
   EXPECT_TRUE(Has(page, "<article id=\"file-2\" class=\"is-trusted-jar\""));
 }
 
-TEST(Page, LeavesOutWhatThereIsNot) {
+TEST(Page, LeavesOutEmptySections) {
   const std::string page = PageOf(Example(Verdict::kNotLookedAt));
   EXPECT_TRUE(Has(page, "NOT LOOKED AT"));
   EXPECT_EQ(Count(page, "<h3>"), 1U) << "the file and the run alone";
@@ -238,7 +238,7 @@ TEST(Page, ShowsWhereTheChainBreaks) {
       Has(page, "<span class=\"link\">manifest</span> <span class=\"at\">not reached</span>"));
 }
 
-TEST(Page, TellsSchemesOfOneCertificateTogether) {
+TEST(Page, ShowsSchemesOfOneCertificateTogether) {
   Report report = Example(Verdict::kSigned);
   CertificateFacts one;
   one.sha256 = "1";
@@ -252,7 +252,7 @@ TEST(Page, TellsSchemesOfOneCertificateTogether) {
   EXPECT_TRUE(Has(page, "<h4>Signed with v3</h4>"));
 }
 
-TEST(Page, SaysOfTheJarSignerAloneWhatTheKernelGot) {
+TEST(Page, ShowsTheKernelsKeyOnlyForTheJarSigner) {
   Report report = Example(Verdict::kSigned);
   CertificateFacts certificate;
   certificate.key.modulus_sha256 = std::string(64, '0');
@@ -272,7 +272,7 @@ TEST(Page, HasTheAlarmsBelowTheFile) {
 }
 
 // A name that is too long is cut, and the key after it is shown.
-TEST(Page, ShowsTheKeyBehindALongName) {
+TEST(Page, ShowsTheKeyAfterALongName) {
   Report report = Example(Verdict::kSigned);
   report.signer.emplace();
   report.signer->subject = std::string(1000, 'n');
@@ -280,7 +280,7 @@ TEST(Page, ShowsTheKeyBehindALongName) {
   EXPECT_TRUE(Has(PageOf(report), "n…, RSA-2048, key 11111111…111111</p>"));
 }
 
-TEST(Page, SaysOfWhichRunAndProgramsItIs) {
+TEST(Page, ShowsTheFileTheTimeAndTheVersions) {
   Report report = Example(Verdict::kSigned);
   report.file_size = 1234567;
   report.file_sha256 = std::string(64, 'd');
@@ -395,7 +395,7 @@ TEST(Page, ToolSignsAPackageThatTheGateRefuses) {
 }
 
 // The name and the value of an option stay on one line, and no text is lost.
-TEST(Page, KeepsTheNamesOfOptionsWhole) {
+TEST(Page, KeepsOptionsOnOneLine) {
   Report report = Example(Verdict::kSigned);
   report.items = {Library("a", &cause::kLibraryNotInstalled)};
   report.items[0].state = ItemState::kAbsent;

@@ -17,7 +17,7 @@ std::vector<double> Percents(const std::vector<DrawnPart>& parts) {
 }  // namespace
 
 // The file has 1000 bytes, and 100 of them are between the entries.
-TEST(DrawnBar, HasEachPartAndWhatLiesBetweenTheEntries) {
+TEST(ProtectionBar, HasEachPartAndTheBytesBetweenTheEntries) {
   const auto parts = DrawBar({{1, 400}, {2, 300}, {3, 150}, {4, 50}, {}}, 1000);
   EXPECT_EQ(Percents(parts), std::vector<double>({40, 30, 15, 5, 10}));
   EXPECT_EQ(parts[4].share.bytes, 100U);
@@ -26,7 +26,7 @@ TEST(DrawnBar, HasEachPartAndWhatLiesBetweenTheEntries) {
 
 // The bar is 100 wide. Each of its five parts is at least 0.75 wide, and the parts share the
 // remaining 96.25 by their bytes. The first part has half of the bytes: 0.75 + 96.25 / 2 = 48.875.
-TEST(DrawnBar, IsAsWideAsItMayBeAndShowsTheLeastByte) {
+TEST(ProtectionBar, FillsItsWidthAndShowsASingleByte) {
   const auto parts = DrawBar({{1, 500'000}, {1, 499'000}, {1, 1}, {1, 499}, {}}, 1'000'000);
   EXPECT_DOUBLE_EQ(parts[0].width, 48.875);
   double end = 0;
@@ -38,7 +38,7 @@ TEST(DrawnBar, IsAsWideAsItMayBeAndShowsTheLeastByte) {
   EXPECT_NEAR(end, 100, 1e-9);
 }
 
-TEST(DrawnBar, DrawsNothingOfWhatIsNotThere) {
+TEST(ProtectionBar, GivesEmptyPartsNoWidth) {
   const auto parts = DrawBar({{}, {1, 1000}, {}, {}, {}}, 1000);
   EXPECT_EQ(Percents(parts), std::vector<double>({0, 100, 0, 0, 0}));
   EXPECT_EQ(parts[0].width, 0);
@@ -47,18 +47,18 @@ TEST(DrawnBar, DrawsNothingOfWhatIsNotThere) {
 }
 
 // The entries of an archive can share their bytes.
-TEST(DrawnBar, TakesMoreBytesThanTheFileHas) {
+TEST(ProtectionBar, AcceptsMoreBytesThanTheFileHas) {
   const auto parts = DrawBar({{1, UINT64_MAX}, {1, UINT64_MAX}, {}, {}, {}}, 1000);
   EXPECT_EQ(Percents(parts), std::vector<double>({50, 50, 0, 0, 0}));
 }
 
-TEST(DrawnBar, OfNoEntriesIsNone) {
+TEST(ProtectionBar, IsEmptyWithoutEntriesAndAllZeroWithoutBytes) {
   EXPECT_TRUE(DrawBar({}, 1000).empty());
   const auto empty = DrawBar({{1, 0}, {}, {}, {}, {}}, 0);
   EXPECT_EQ(Percents(empty), std::vector<double>({0, 0, 0, 0, 0}));
 }
 
-TEST(DrawnBar, FaultsTakeALineWhereThereAreAny) {
+TEST(ProtectionBar, HasAPartForEachKindOfFault) {
   Protection protection = {{1, 400}, {}, {}, {}, {}};
   protection.differing = {2, 300};
   protection.uncompared = {1, 200};

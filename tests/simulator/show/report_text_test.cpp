@@ -75,14 +75,14 @@ TEST(ReportText, HasTheVerdictTheItemsAndWhatToDo) {
       "  ✓ key                     registered for com.example.vault\n");
 }
 
-TEST(ReportText, MarksArePlainWhereNoOthersCanBeShown) {
+TEST(ReportText, MarksAreAsciiWithoutUtf8) {
   const Lines lines = LinesOf(Printed(Example(), kAscii));
   EXPECT_EQ(lines[1].substr(0, 11), "  + package");
   EXPECT_EQ(lines[3].substr(0, 10), "  x lib/ar");
   EXPECT_EQ(lines[6].substr(0, 10), "  - lib/x8");
 }
 
-TEST(ReportText, SignerStandsAsApksignerPrintsIt) {
+TEST(ReportText, SignerIsPrintedAsApksignerPrintsIt) {
   Report report = Example();
   report.items.clear();
   report.signer = Signer();
@@ -112,7 +112,7 @@ TEST(ReportText, SignerStandsAsApksignerPrintsIt) {
                 "verified, 1 entry (1 byte) not listed\n");
 }
 
-TEST(ReportText, QuietIsTheVerdictAlone) {
+TEST(ReportText, QuietPrintsOnlyTheVerdictLine) {
   EXPECT_EQ(
       Printed(Example(), kUtf8, Detail::kVerdict),
       "PARTLY SIGNED  base.apk   lib/arm64/libvault.so: its bytes are not those that the manifest "
@@ -138,7 +138,7 @@ TEST(ReportText, VerboseNamesWhatIsNotListedAndTheChain) {
   }
 }
 
-TEST(ReportText, WarningsStandOut) {
+TEST(ReportText, WarningsAreYellowAndSayWhatToDo) {
   Report report = Example();
   report.items.clear();
   report.warnings = {{&cause::kSchemesStripped, "v2"}};
@@ -160,7 +160,7 @@ TEST(ReportText, RefusalsAreRedAndTheGoodVerdictIsGreen) {
 }
 
 // Names of up to 40 characters set the width of the column, and longer names extend past it.
-TEST(ReportText, OneLongNameMovesNoOther) {
+TEST(ReportText, NamesWidenTheColumnUpTo40Characters) {
   const std::string longest(40, 'l');
   const auto column = [&](const std::string& other) {
     Report report = Example();
@@ -176,7 +176,7 @@ TEST(ReportText, OneLongNameMovesNoOther) {
 }
 
 // Neighbouring items with the same cure print it once.
-TEST(ReportText, NeighboursShareWhatToDo) {
+TEST(ReportText, NeighboursWithTheSameCausePrintOneCure) {
   Report report = Example();
   report.items = {
       {ItemKind::kLibrary, "a", "", ItemState::kAbsent, {&cause::kLibraryMissing, ""}},
@@ -185,7 +185,7 @@ TEST(ReportText, NeighboursShareWhatToDo) {
   EXPECT_EQ(LinesOf(Printed(report)).size(), 5U);
 }
 
-TEST(ReportText, NothingOfAHostileFileReachesATerminal) {
+TEST(ReportText, HostileCharactersAreNotPrinted) {
   const Report report = HostileReport(kHostileText);
   for (const Look& look : {kUtf8, kAscii}) {
     const std::string text = Printed(report, look, Detail::kAll);

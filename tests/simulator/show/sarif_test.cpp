@@ -46,7 +46,7 @@ Lines ResultsOf(const Json& log) {
 
 }  // namespace
 
-TEST(Sarif, BeginsAsALaterRunExpectsItOfWhatItReplaces) {
+TEST(Sarif, BeginsWithTheTextThatALaterRunExpects) {
   EXPECT_EQ(Sarif().Log().substr(0, kSarifStart.size()), kSarifStart);
 }
 
@@ -88,7 +88,7 @@ TEST(Sarif, HasTheWholeRun) {
     }]})json"));
 }
 
-TEST(Sarif, RulesAndFilesStandOnce) {
+TEST(Sarif, RulesAndFilesAreListedOnce) {
   Report refused = Good("b.apk");
   refused.verdict = Verdict::kRefused;
   refused.items = {RefusedFor(&cause::kToolError, "a"), RefusedFor(&cause::kToolError, "b")};
@@ -137,7 +137,7 @@ TEST(Sarif, FileThatWasNotJudgedIsAnErrorAndTheRunWasNotSuccessful) {
             Json::parse(R"([{"executionSuccessful": true}])"));
 }
 
-TEST(Sarif, HostileTextsAreTexts) {
+TEST(Sarif, HostileTextsKeepMarkupButNoEscapeCharacter) {
   const Json log = LogOf({HostileReport(kHostileText)});
   ASSERT_TRUE(log.is_object());
   EXPECT_EQ(log["runs"][0]["results"].size(), 4U);
@@ -149,7 +149,7 @@ TEST(Sarif, HostileTextsAreTexts) {
 // RFC 3986 §2.3 lists the characters that need no percent-encoding. The "/" of a path is not
 // encoded either. A colon is encoded, because the part before it would otherwise read as the scheme
 // of a URI (§4.2).
-TEST(UriOf, IsAReferenceWhateverTheName) {
+TEST(UriOf, EncodesAllButUnreservedCharactersAndSlashes) {
   EXPECT_EQ(UriOf("base.apk"), "base.apk");
   EXPECT_EQ(UriOf("../a-b/c_d~e.apk"), "../a-b/c_d~e.apk");
   EXPECT_EQ(UriOf("/data/app/base.apk"), "file:///data/app/base.apk");

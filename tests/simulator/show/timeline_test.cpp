@@ -29,7 +29,7 @@ const std::string kDigest(64, '7');
 
 }  // namespace
 
-TEST(Timeline, GoodPackage) {
+TEST(Timeline, ShowsTheStepsOfAGoodPackage) {
   const std::string journal =
       kStart +
       R"({"event":"log","priority":4,"tag":"ApkToolkit","text":"VeltSignJni starts: 3.\n"}
@@ -59,7 +59,7 @@ TEST(Timeline, GoodPackage) {
 )");
 }
 
-TEST(Timeline, RefusalsStandOut) {
+TEST(Timeline, FailuresAreShownInRed) {
   const std::string journal = kStart + R"({"event":"integrity","pid":0,"text":null}
 {"event":"integrity","pid":42,"text":"zz"}
 {"event":"verify","fd":3,"path":"/data/app/base.apk","result":-1,"errno":126}
@@ -97,7 +97,7 @@ TEST(Timeline, RefusalsStandOut) {
   EXPECT_EQ(red, 2 * 6);
 }
 
-TEST(Timeline, EmptyPayloadIsCalledSo) {
+TEST(Timeline, EmptyPayloadIsShownAsNoData) {
   const std::string journal =
       kStart +
       R"({"event":"sign","fd":3,"path":"/data/app/base.apk","payload":"0000","result":0,"errno":0}
@@ -109,7 +109,7 @@ TEST(Timeline, EmptyPayloadIsCalledSo) {
 }
 
 // A payload of 32 bytes is called a digest.
-TEST(Timeline, OnlyAPayloadOfADigestsLengthIsCalledOne) {
+TEST(Timeline, OnlyAPayloadOf32BytesIsCalledADigest) {
   const auto payload = [](const std::string& data) {
     const Events events = ParseEvents("{\"event\":\"sign\",\"path\":\"/a\",\"payload\":\"0000" +
                                       data + "\",\"result\":0}\n");
@@ -129,7 +129,7 @@ TEST(Timeline, EndsThatAreFailuresAreMarked) {
   EXPECT_TRUE(is_failure("\"signal\":9"));
 }
 
-TEST(Timeline, NothingIsPrintedThatATerminalWouldObey) {
+TEST(Timeline, ControlCharactersAreShownAsBytes) {
   const std::string journal =
       kStart + R"({"event":"log","priority":4,"tag":"\u001b[2J","text":"a\u0007\u009b\uf7e9é\nb\n"}
 )" + kExit;
@@ -137,12 +137,12 @@ TEST(Timeline, NothingIsPrintedThatATerminalWouldObey) {
             "   1  log        [\\x1b[2J] a\\x07\\xc2\\x9b\\xe9é\\x0ab");
 }
 
-TEST(Timeline, UnknownEventIsShownAsItStands) {
+TEST(Timeline, UnknownEventIsShownAsJson) {
   EXPECT_EQ(LinesOf(Printed(kStart + "{\"event\":\"later\",\"a\":1}\n" + kExit))[0],
             "   1  later      {\"a\":1,\"event\":\"later\"}");
 }
 
-TEST(Timeline, UnknownEventIsNotObeyedEither) {
+TEST(Timeline, ControlCharactersOfAnUnknownEventAreEscaped) {
   EXPECT_EQ(LinesOf(Printed(kStart + "{\"event\":\"\\u001b\\uf7e9\"}\n" + kExit))[0],
             "   1  \\x1b\\xe9   {\"event\":\"\\u001b\uf7e9\"}");
 }

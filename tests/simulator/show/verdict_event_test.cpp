@@ -136,7 +136,7 @@ TEST(VerdictEvent, HoldsTheWholeReport) {
 }
 
 // The simulator does not know the version of another tool.
-TEST(VerdictEvent, OtherToolIsKnownByItsBytesAlone) {
+TEST(VerdictEvent, OtherToolHasADigestAndNoVersion) {
   Report report;
   report.tool = {false, "88"};
   EXPECT_EQ(ParseJournal(VerdictEvent(report)).at(0)["tool"], Json::parse(R"({"sha256": "88"})"));
@@ -201,7 +201,7 @@ TEST(VerdictEvent, EveryStateOfALinkHasACode) {
 
 // The event reports the key that the kernel got as the key of scheme v1, even if no certificate has
 // this key.
-TEST(VerdictEvent, KeyThatNoCertificateShowsIsTold) {
+TEST(VerdictEvent, KeyWithoutACertificateIsReportedAsV1Signer) {
   Report report;
   report.key = {"ab", 2048, true};
   const Json signers = ParseJournal(VerdictEvent(report)).at(0)["signers"];

@@ -12,7 +12,7 @@ Item Library(const Cause* why) {
 
 }  // namespace
 
-TEST(Summary, CountsEachVerdict) {
+TEST(Summary, CountsFilesByVerdict) {
   EXPECT_EQ(Summary({Verdict::kSigned, Verdict::kRefused, Verdict::kSigned, Verdict::kNotLookedAt}),
             "4 files: 2 signed, 1 refused, 1 not looked at");
   EXPECT_EQ(Summary({Verdict::kTrustedJar}), "1 file: 1 trusted JAR");
@@ -31,7 +31,7 @@ TEST(Summary, CountsEachVerdict) {
   EXPECT_EQ(Summary({}), "0 files");
 }
 
-TEST(Words, SayWhatToDoOnceForNeighboursThatNeedTheSame) {
+TEST(HasCure, IsTrueOnceForConsecutiveItemsWithTheSameCause) {
   const Item changed = Library(&cause::kLibraryChanged);
   const Item refused = Library(&cause::kKernelRefused);
   EXPECT_TRUE(HasCure(changed, nullptr));
@@ -39,7 +39,7 @@ TEST(Words, SayWhatToDoOnceForNeighboursThatNeedTheSame) {
   EXPECT_FALSE(HasCure(changed, &changed));
 }
 
-TEST(Words, SayNothingToDoForWhatFollowsFromAnother) {
+TEST(HasCure, IsFalseForConsequencesAndItemsWithNothingToSign) {
   EXPECT_FALSE(HasCure(Library(&cause::kPackageRefused), nullptr));
   EXPECT_FALSE(HasCure(Library(&cause::kNotReached), nullptr));
   Item nothing = Library(&cause::kLibraryOtherAbi);
@@ -81,13 +81,13 @@ TEST(HeadFacts, NameTheSignerAndTheKernelsKey) {
   EXPECT_EQ(HeadFacts(report, "..."), Lines());
 }
 
-TEST(HeadFacts, OfAnUnknownAlgorithmHaveItsNameAlone) {
+TEST(HeadFacts, NameAnUnknownAlgorithmWithoutASize) {
   Report report = WithSigner();
   report.signer->key = {"1.2.3", 0, "spki", ""};
   EXPECT_EQ(HeadFacts(report, "...")[1], "signer CN=a, 1.2.3");
 }
 
-TEST(HeadFacts, SoundTheAlarmsAndNoOtherWarnings) {
+TEST(HeadFacts, ShowAlarmsAndTheNumberOfWarnings) {
   Report report;
   report.warnings = {{&cause::kUnlistedEntries, "x"}, {&cause::kBlockAmbiguous, "why"}};
   EXPECT_EQ(HeadFacts(report, "..."),
@@ -111,7 +111,7 @@ TEST(HeadFacts, HaveTheReasonInPlaceOfTheSigner) {
 }
 
 // The tool's own refusals are not the reason why phones do not install the package.
-TEST(HeadFacts, HaveTheInstallersReasonWhereTheVerdictIsHis) {
+TEST(HeadFacts, ShowTheInstallersReasonIfItDecidesTheVerdict) {
   Report report = WithSigner();
   report.verdict = Verdict::kNotInstallable;
   report.items = {Library(&cause::kLibraryMissing),
@@ -158,7 +158,7 @@ TEST(HeadFacts, NameTheOtherSigner) {
             Lines({"com.app", "signer CN=a, RSA-512", "phones install it for CN=other"}));
 }
 
-TEST(SignerRows, SayOfTheKeyWhatTheKernelGot) {
+TEST(SignerRows, SayWhetherTheKernelGotTheKey) {
   Report report = WithSigner();
   EXPECT_EQ(SignerRows(report).back(),
             Rows::value_type("modulus SHA-256 digest", "0123456789abcdef (of the modulus alone)"));
@@ -178,7 +178,7 @@ TEST(SignerRows, SayOfTheKeyWhatTheKernelGot) {
   EXPECT_EQ(SignerRows(report).size(), 1U);
 }
 
-TEST(Words, LinkBeyondABreakSaysNothingOfItself) {
+TEST(LinkText, IsNotReachedAfterABrokenLink) {
   EXPECT_EQ(TextOf(Link{"manifest", LinkState::kHolds, "text"}), "text");
   EXPECT_EQ(TextOf(Link{"manifest", LinkState::kBroken, "why"}), "why");
   EXPECT_EQ(TextOf(Link{"manifest", LinkState::kNotReached, "text"}), "not reached");

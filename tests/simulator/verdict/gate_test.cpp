@@ -84,7 +84,7 @@ void ExpectUnexpected(const Lines& signers, const Report& report) {
 
 }  // namespace
 
-TEST(ReadDigest, TakesTheFormsInWhichToolsPrintIt) {
+TEST(ReadDigest, AcceptsTheFormsThatToolsPrint) {
   const std::string digest = "0123456789abcdef0123456789abcdef0123456789abcdef0123456789abcdef";
   EXPECT_EQ(ReadDigest(digest), digest);
   EXPECT_EQ(ReadDigest("0123456789ABCDEF0123456789ABCDEF0123456789ABCDEF0123456789ABCDEF"), digest);
@@ -93,7 +93,7 @@ TEST(ReadDigest, TakesTheFormsInWhichToolsPrintIt) {
             digest);
 }
 
-TEST(ReadDigest, TakesNothingElse) {
+TEST(ReadDigest, RejectsOtherForms) {
   const std::string digits(62, '0');
   for (const std::string& text :
        {std::string(), digits, digits + "000", digits + "0", digits + "0g", digits + " 0",
@@ -105,7 +105,7 @@ TEST(ReadDigest, TakesNothingElse) {
   }
 }
 
-TEST(Gate, WithoutADemandTakesEverything) { ExpectTaken({}, SignedBy(kOwner)); }
+TEST(Gate, AcceptsAnySignerIfNoneIsNamed) { ExpectTaken({}, SignedBy(kOwner)); }
 
 TEST(Gate, SignerIsKnownByEachOfHisDigests) {
   for (const std::string& digest : {kOwner.sha256, kOwner.key.sha256, kOwner.key.modulus_sha256}) {
@@ -145,7 +145,7 @@ TEST(Gate, SaysThatASignerHasNoReadableName) {
 
 // The gate compares the modulus that the kernel gets. A certificate that shows another key does not
 // count.
-TEST(Gate, CertificateOfAnotherKeyThanTheKernelGetsCountsForNothing) {
+TEST(Gate, CertificateWithoutTheKernelsKeyDoesNotCount) {
   Report report = SignedBy(kOwner);
   report.key->sha256 = kOther.key.modulus_sha256;
   ExpectUnexpected({kOwner.sha256}, report);
@@ -164,7 +164,7 @@ TEST(Gate, KeyWithoutACertificateIsKnownByItsModulus) {
 }
 
 // Anyone can make signatures for the owner's modulus with a forgeable exponent such as 1.
-TEST(Gate, ForgeableKeyIsNobodys) {
+TEST(Gate, ForgeableKeyIsRejectedEvenIfExpected) {
   Report report = SignedBy(kOwner);
   report.warnings = {{&cause::kForgeableKey, "1"}};
   ExpectUnexpected({kOwner.key.modulus_sha256}, report);
@@ -193,14 +193,14 @@ TEST(Gate, SignersOfTheNewestSchemeMustBeExpectedAsWell) {
   ExpectTaken(owner, InstalledFor(SignedBy(kOwner), {all_own, refuses}));
 }
 
-TEST(Gate, SameSignerIsNotToldTwice) {
+TEST(Gate, ReportsEachUnexpectedSignerOnce) {
   const Report report = InstalledFor(
       SignedBy(kOther),
       {Takes(27, {{"v2", kOther}}), Takes(30, {{"v3", kThird}}), Takes(33, {{"v3", kThird}})});
   EXPECT_EQ(With({kOwner.sha256}, report).codes, Lines({"signer-unexpected", "signer-unexpected"}));
 }
 
-TEST(Gate, SignerOfWhatWasNotVerifiedIsNotKnown) {
+TEST(Gate, UnverifiedPackageHasNoVerifiedSigner) {
   Report report = SignedBy(kOwner);
   report.verdict = Verdict::kRefused;
   report.items[0] = {ItemKind::kPackage,        "package", "", ItemState::kRefused,
@@ -261,7 +261,7 @@ Judged WithoutWarnings(const Report& report, const Lines& signers = {}) {
 
 }  // namespace
 
-TEST(GateOfWarnings, RefusesWhatThereIsAWarningOf) {
+TEST(WarningsGate, RefusesAPackageWithAWarning) {
   Report report = SignedBy(kOwner);
   const Judged good = WithoutWarnings(report);
   EXPECT_EQ(good.codes, Lines());
@@ -273,7 +273,7 @@ TEST(GateOfWarnings, RefusesWhatThereIsAWarningOf) {
   ExpectTaken({kOwner.sha256}, report);
 }
 
-TEST(GateOfWarnings, SaysTheFirstAndHowManyMore) {
+TEST(WarningsGate, SaysTheFirstAndHowManyMore) {
   GateOptions options;
   options.refuses_warnings = true;
   Report report = SignedBy(kOwner);
@@ -285,7 +285,7 @@ TEST(GateOfWarnings, SaysTheFirstAndHowManyMore) {
             "bits are not safe (and 2 more)");
 }
 
-TEST(GateOfWarnings, AnotherSignerOfTheNewestSchemeCountsAsOne) {
+TEST(WarningsGate, OtherSignerOfTheNewestSchemeCountsAsAWarning) {
   Report report = InstalledFor(SignedBy(kOwner), {Takes(27, {{"v2", kOther}})});
   report.verdict = Verdict::kOtherSigner;
   GateOptions options;
@@ -296,14 +296,14 @@ TEST(GateOfWarnings, AnotherSignerOfTheNewestSchemeCountsAsOne) {
 }
 
 // The refusal for the signer comes first, and both refusals are reported.
-TEST(GateOfWarnings, ComesBehindTheSigner) {
+TEST(WarningsGate, ComesAfterTheRefusalOfTheSigner) {
   Report report = SignedBy(kOther);
   report.warnings = {{&cause::kWeakKey, "1024"}};
   EXPECT_EQ(WithoutWarnings(report, {kOwner.sha256}).codes,
             Lines({"signer-unexpected", "warnings-refused"}));
 }
 
-TEST(GateOfWarnings, WhatIsRefusedAnywayStaysAsItIs) {
+TEST(WarningsGate, ChangesOnlyGoodVerdicts) {
   for (const Verdict verdict : {Verdict::kRefused, Verdict::kPartlySigned, Verdict::kNotInstallable,
                                 Verdict::kNotLookedAt, Verdict::kNotSimulated}) {
     Report report = SignedBy(kOwner);
@@ -333,11 +333,11 @@ Lines AfterOthers(std::vector<Report> reports) {
 
 }  // namespace
 
-TEST(GateOfOnePackage, TakesOneSigner) {
+TEST(OneSignerGate, AcceptsFilesOfOneSigner) {
   EXPECT_EQ(AfterOthers({SignedBy(kOwner), SignedBy(kOwner, "split.apk")}), Lines());
 }
 
-TEST(GateOfOnePackage, SaysWhichFileDiffersFromWhich) {
+TEST(OneSignerGate, SaysWhichFileDiffersFromWhich) {
   const GateOptions options;
   Gate gate(options);
   Report base = SignedBy(kOwner), split = SignedBy(kOther, "split.apk");
@@ -352,7 +352,7 @@ TEST(GateOfOnePackage, SaysWhichFileDiffersFromWhich) {
             std::string::npos);
 }
 
-TEST(GateOfOnePackage, ComparesEachWithTheFirst) {
+TEST(OneSignerGate, ComparesEachWithTheFirst) {
   EXPECT_EQ(AfterOthers({SignedBy(kOwner), SignedBy(kOwner), SignedBy(kOther)}),
             Lines({"signer-differs"}));
   const GateOptions options;
@@ -364,7 +364,7 @@ TEST(GateOfOnePackage, ComparesEachWithTheFirst) {
 }
 
 // Phones compare certificates, and the kernel compares keys.
-TEST(GateOfOnePackage, AnotherCertificateOrKeyIsAnotherSigner) {
+TEST(OneSignerGate, AnotherCertificateOrKeyIsAnotherSigner) {
   CertificateFacts renewed = kOwner;
   renewed.sha256 = kThird.sha256;
   EXPECT_EQ(AfterOthers({SignedBy(kOwner), SignedBy(renewed)}), Lines({"signer-differs"}));
@@ -373,7 +373,7 @@ TEST(GateOfOnePackage, AnotherCertificateOrKeyIsAnotherSigner) {
   EXPECT_EQ(AfterOthers({SignedBy(kOwner), report}), Lines({"signer-differs"}));
 }
 
-TEST(GateOfOnePackage, SignersOfAllPhonesAreCompared) {
+TEST(OneSignerGate, SignersOfAllPhonesAreCompared) {
   const Report by_owner = InstalledFor(SignedBy(kOwner), {Takes(27, {{"v2", kOwner}})});
   const Report by_other = InstalledFor(
       SignedBy(kOwner), {Takes(27, {{"v2", kOwner}}), Takes(28, {{"v2", kOwner}, {"v3", kOther}})});
@@ -384,7 +384,7 @@ TEST(GateOfOnePackage, SignersOfAllPhonesAreCompared) {
   EXPECT_EQ(AfterOthers({by_owner, by_other_before}), Lines({"signer-differs"}));
 }
 
-TEST(GateOfOnePackage, SignersAreComparedInAnyOrder) {
+TEST(OneSignerGate, SignersAreComparedInAnyOrder) {
   const auto installed_for = [](const std::vector<InstallerSigner>& signers) {
     return InstalledFor(SignedBy(kOwner), {Takes(27, signers)});
   };
@@ -405,7 +405,7 @@ TEST(GateOfOnePackage, SignersAreComparedInAnyOrder) {
 }
 
 // If no installer is asked, a file counts as signed by the signers that it names.
-TEST(GateOfOnePackage, WithoutAnInstallerTheNewestSchemesThatFilesNameAreCompared) {
+TEST(OneSignerGate, NewestSchemesInTheFilesCountWithoutAnInstaller) {
   Report by_owner = SignedBy(kOwner), by_other = SignedBy(kOwner);
   by_owner.newer = {{"v2", kOther}, {"v3", kOwner}};
   by_other.newer = {{"v2", kOwner}, {"v3", kOther}};
@@ -415,7 +415,7 @@ TEST(GateOfOnePackage, WithoutAnInstallerTheNewestSchemesThatFilesNameAreCompare
   EXPECT_EQ(AfterOthers({by_owner, by_other}), Lines({"signer-differs"}));
 }
 
-TEST(GateOfOnePackage, OthersAreNotCompared) {
+TEST(OneSignerGate, OtherNamelessAndRefusedPackagesAreNotCompared) {
   Report other_package = SignedBy(kOther);
   other_package.package_name = "com.other";
   EXPECT_EQ(AfterOthers({SignedBy(kOwner), other_package}), Lines());

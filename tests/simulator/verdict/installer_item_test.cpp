@@ -51,7 +51,7 @@ CertificateFacts WithKey(const std::string& key) {
 
 }  // namespace
 
-TEST(InstallerItem, IsThereForARefusalAlone) {
+TEST(InstallerItem, IsAddedOnlyForARefusal) {
   EXPECT_EQ(Told({}), "");
   EXPECT_EQ(Told({Judgement::State::kMissing, "why", {}}), "");
   EXPECT_EQ(Told(Judged({Taken(27, kNewestLevel)})), "");
@@ -59,13 +59,13 @@ TEST(InstallerItem, IsThereForARefusalAlone) {
             "phones of API 27 to 33 install it, verified by v1, v2");
 }
 
-TEST(InstallerItem, SaysWhatNoPhoneTakes) {
+TEST(InstallerItem, SaysWhyNoPhoneInstallsThePackage) {
   const Judgement judgement = Judged({Refused(27, kNewestLevel, kFault)});
   EXPECT_EQ(Told(judgement), "not-installable: phones do not install it: a fault of x (A_FAULT)");
   EXPECT_EQ(TakersText(judgement), "");
 }
 
-TEST(InstallerItem, SaysWhichPhonesTakeIt) {
+TEST(InstallerItem, SaysWhichPhonesInstallThePackage) {
   const Judgement judgement = Judged({Taken(27, 29), Refused(30, kNewestLevel, kFault)});
   EXPECT_EQ(Told(judgement),
             "not-installable-on-some: phones of API 27 to 29 install it, but phones of API 30 and "
@@ -114,7 +114,7 @@ TEST(OtherSigner, IsOneOfTheNewestScheme) {
 }
 
 // The newest phones that install the package count.
-TEST(OtherSigner, IsTheOneOfTheNewestPhones) {
+TEST(OtherSigner, IsTheSignerForTheNewestPhonesThatInstall) {
   Report report;
   report.signer = WithKey("own");
   RangeJudgement old = Taken(27, 27), other = Taken(28, 32);

@@ -32,7 +32,7 @@ std::string LibraryItem(const std::string& error, int opening = 0, bool has_dire
   return ItemsOf(report)[1];
 }
 
-TEST(MakeReport, LinesBeforeALibraryWasNotVerifiedSayWhy) {
+TEST(MakeReport, LogLinesBeforeARefusedLibrarySayWhy) {
   EXPECT_EQ(LibraryItem("Can't read file: x (streamoff=-1)\n"),
             "lib/arm64/libfoo.so refused library-no-file");
   EXPECT_EQ(LibraryItem("Can't find file in META-INF/MANIFEST.MF: x\n"),
@@ -41,7 +41,7 @@ TEST(MakeReport, LinesBeforeALibraryWasNotVerifiedSayWhy) {
             "lib/arm64/libfoo.so refused library-digest");
 }
 
-TEST(MakeReport, LibraryThatDoesNotOpenIsRefusedUnlessItIsNotThere) {
+TEST(MakeReport, LibraryThatCannotBeOpenedIsRefusedUnlessMissing) {
   const auto item = [](int error, bool has_directory) {
     return LibraryItem("Can't open file: x\n", error, has_directory).substr(20);
   };
@@ -56,14 +56,14 @@ TEST(MakeReport, LibraryThatDoesNotOpenIsRefusedUnlessItIsNotThere) {
   EXPECT_EQ(item(0, true), "refused library-not-opened the reason is not known");
 }
 
-TEST(MakeReport, LibraryThatIsNotThereIsRefusedWhereTheUserIsStrict) {
+TEST(MakeReport, MissingLibraryIsRefusedIfTheUserIsStrict) {
   EXPECT_EQ(LibraryItem("Can't open file: x\n", ENOENT, false, {true}),
             "lib/arm64/libfoo.so refused library-not-installed");
   EXPECT_EQ(LibraryItem("Can't open file: x\n", ENOENT, true, {true}),
             "lib/arm64/libfoo.so refused library-missing");
 }
 
-TEST(MakeReport, LibraryThatThePackageKeepsIsToldApart) {
+TEST(MakeReport, LibraryThatStaysInThePackageHasItsOwnReason) {
   PackageFacts facts = WithLibraries({"lib/arm64-v8a/libfoo.so"}, ENOENT);
   facts.manifest.extracts_libraries = false;
   EXPECT_EQ(Items({kLibrariesStart, Log(6, "Can't open file: x\n"),
@@ -75,7 +75,7 @@ TEST(MakeReport, LibraryThatThePackageKeepsIsToldApart) {
 
 // The tool reads the entries in order and stops at the damaged entry. Later libraries are not
 // signed, even if they are good.
-TEST(MakeReport, LibraryBehindADamagedEntryIsRefusedIfItLiesThere) {
+TEST(MakeReport, LibraryAfterADamagedEntryIsRefusedIfInstalled) {
   const auto items = [](int error, bool is_strict) {
     PackageFacts facts =
         WithLibraries({"lib/arm64-v8a/liba.so", "lib/arm64-v8a/libb.so", "lib/x86/libc.so"}, error);
@@ -94,7 +94,7 @@ TEST(MakeReport, LibraryBehindADamagedEntryIsRefusedIfItLiesThere) {
   EXPECT_EQ(items(ENOENT, true)[2], "lib/arm64/libb.so refused library-not-installed");
 }
 
-TEST(MakeReport, LibraryThatCannotBeLaidOutIsRefused) {
+TEST(MakeReport, LibraryThatCannotBeExtractedIsRefused) {
   RunRecord record = Record({kLibrariesStart, Log(6, "Can't open file: x\n"),
                              Log(6, "VeltSignJni: File not verified: " + kLibrary + "\n"),
                              kFileStart, Sign(kFile, kPackagePayload)});
@@ -120,7 +120,7 @@ TEST(MakeReport, EachVanishedLibraryHasItsOwnError) {
   EXPECT_EQ(items[2], "b.so refused library-not-opened EACCES: Permission denied");
 }
 
-TEST(MakeReport, LibrariesOfOtherProcessorsAreNothingToSign) {
+TEST(MakeReport, LibraryOfAnUnknownAbiHasNothingToSign) {
   const PackageFacts facts = WithLibraries({"lib/x86_64/libfoo.so", "lib/armeabi/libfoo.so"});
   const Report report = Made({kLibrariesStart, kTakesUp, Sign("/data/app/lib/arm/libfoo.so", "00"),
                               kFileStart, Sign(kFile, kPackagePayload)},
@@ -131,7 +131,7 @@ TEST(MakeReport, LibrariesOfOtherProcessorsAreNothingToSign) {
                    "lib/arm/libfoo.so done"}));
 }
 
-TEST(MakeReport, LibrariesOfARefusedPackageFollowIt) {
+TEST(MakeReport, LibrariesOfARefusedPackageAreRefused) {
   const PackageFacts facts = WithLibraries({"lib/arm64-v8a/libfoo.so"});
   const Report report = Made({Log(6, "Can't validate manifest.\n"), kLibrariesStart,
                               Log(6, "VeltSignJni: malformed apk: /a\n"), kFileStart, kTakesUp,
@@ -157,7 +157,7 @@ TEST(MakeReport, LibrariesThatTheKernelWasNotAskedForAreKnownByTheirOrder) {
                                     "lib/arm64/libb.so refused integrity-zero"}));
 }
 
-TEST(MakeReport, LibrariesBehindTheToolsEndAreNotReached) {
+TEST(MakeReport, LibrariesAfterTheEndOfTheToolAreNotReached) {
   const Report report = Made({kLibrariesStart, kTakesUp, Integrity("1f"),
                               Sign("/data/app/lib/arm64/liba.so", kPackagePayload)},
                              WithLibraries({"lib/arm64-v8a/liba.so", "lib/arm64-v8a/libb.so"}), {},

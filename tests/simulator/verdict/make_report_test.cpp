@@ -8,7 +8,7 @@
 
 using namespace simulator;
 
-TEST(MakeReport, GoodPackage) {
+TEST(MakeReport, GoodPackageIsSigned) {
   const Report report =
       Made({kLibrariesStart, kTakesUp, Integrity("1f"), Sign(kLibrary, kPackagePayload), kFileStart,
             kTakesUp, Integrity("1f"), Sign(kFile, kPackagePayload), Register(0)});
@@ -18,7 +18,7 @@ TEST(MakeReport, GoodPackage) {
   EXPECT_EQ(report.path, kFile);
 }
 
-TEST(MakeReport, TrustedJarIsGoodWhateverItLacksOfAPackage) {
+TEST(MakeReport, TrustedJarIsGoodWithoutAnAndroidManifest) {
   const Report report = Made({Log(6, "Can't extract Android Manifest: Entry not found\n"),
                               kLibrariesStart, Log(6, "VeltSignJni: malformed apk: /a\n"),
                               kFileStart, Verify(0), Sign(kFile, kNoData)});
@@ -26,7 +26,7 @@ TEST(MakeReport, TrustedJarIsGoodWhateverItLacksOfAPackage) {
   EXPECT_EQ(ItemsOf(report), Lines({"JAR done"}));
 }
 
-TEST(MakeReport, JarThatIsNotTrusted) {
+TEST(MakeReport, JarThatTheKernelDoesNotTrustIsRefused) {
   const Report report = Made({Log(6, "Can't extract Android Manifest: Entry not found\n"),
                               Verify(ENOKEY), Log(4, "VELT can't verify a file\n")});
   EXPECT_EQ(report.verdict, Verdict::kNotTrustedJar);
@@ -34,13 +34,13 @@ TEST(MakeReport, JarThatIsNotTrusted) {
             Lines({"JAR refused jar-not-trusted ENOKEY: Required key not available"}));
 }
 
-TEST(MakeReport, DamagedAndroidManifestIsToldFromAJar) {
+TEST(MakeReport, DamagedAndroidManifestHasItsOwnReason) {
   EXPECT_EQ(
       Items({Log(6, "Can't extract Android Manifest: Inconsistent information\n"), Verify(ENOKEY)}),
       Lines({"JAR refused android-manifest-damaged"}));
 }
 
-TEST(MakeReport, TrustedJarThatTheKernelRefuses) {
+TEST(MakeReport, TrustedJarThatTheKernelDoesNotSignIsRefused) {
   const Report report = Made({Verify(0), Sign(kFile, kNoData, EPERM)});
   EXPECT_EQ(report.verdict, Verdict::kRefused);
   EXPECT_EQ(ItemsOf(report), Lines({"JAR refused kernel-refused EPERM: Operation not permitted"}));
@@ -53,7 +53,7 @@ TEST(MakeReport, ErrorAfterTheVerificationOfAJarCounts) {
   EXPECT_EQ(ItemsOf(report), Lines({"JAR done", "tool refused tool-error odd"}));
 }
 
-TEST(MakeReport, DamagedEntriesAreADoubtAndForTheStrictARefusal) {
+TEST(MakeReport, DamagedEntriesAreRefusedOnlyIfTheUserIsStrict) {
   PackageFacts facts;
   facts.entries = {{{"res/a", 1, true}, true, false}, {{"res/b", 1, true}, true, false}};
   const Report report = Made({Sign(kFile, kPackagePayload)}, facts);
@@ -68,7 +68,7 @@ TEST(MakeReport, DamagedEntriesAreADoubtAndForTheStrictARefusal) {
             Lines({"package done", "entries refused entries-damaged 2 entries: res/a, ..."}));
 }
 
-TEST(MakeReport, OtherWarningsAreNoRefusalForTheStrict) {
+TEST(MakeReport, OtherWarningsAreNotRefusedIfTheUserIsStrict) {
   PackageFacts facts;
   facts.too_long = {"a"};
   const Report report = Made({kFileStart, Sign(kFile, kPackagePayload)}, facts, {true});
@@ -77,7 +77,7 @@ TEST(MakeReport, OtherWarningsAreNoRefusalForTheStrict) {
   EXPECT_EQ(report.warnings[0].cause, &cause::kNotLookedInto);
 }
 
-TEST(MakeReport, ErrorThatNoLineTellsTheUseOfCounts) {
+TEST(MakeReport, ErrorThatExplainsNoOtherLineIsAToolError) {
   EXPECT_EQ(Items({kFileStart, Sign(kFile, kPackagePayload), Log(6, "Can't open file: x\n")}),
             Lines({"package done", "tool refused tool-error Can't open file: x"}));
 }
@@ -145,7 +145,7 @@ TEST(MakeReport, KeyThatIsKnownAlreadyIsRegistered) {
   EXPECT_EQ(Items({Sign(kFile, kPackagePayload), Register(65540)})[1], "com.app done");
 }
 
-TEST(MakeReport, KeyThatLibzuRefuses) {
+TEST(MakeReport, KeyThatLibzuRefusesMakesThePackagePartlySigned) {
   const Report report =
       Made({kFileStart, Sign(kFile, kPackagePayload), Log(4, "VeltSign finished: 0.\n"),
             Register(65541), Log(6, "ZuAddCertificate: ZuNewCertificate failed 65541.\n")});
@@ -153,7 +153,7 @@ TEST(MakeReport, KeyThatLibzuRefuses) {
   EXPECT_EQ(ItemsOf(report), Lines({"package done", "com.app refused registration-refused 65541"}));
 }
 
-TEST(MakeReport, KeyOfARefusedPackage) {
+TEST(MakeReport, KeyOfARefusedPackageIsRefused) {
   EXPECT_EQ(Items({Log(6, "Can't load manifest: size=3\n"), kFileStart,
                    Log(4, "VeltSign finished: 65536.\n"),
                    Log(6, "Apk archive is not valid for fd=3, path=/a\n")}),
@@ -167,7 +167,7 @@ TEST(MakeReport, OnlyTheToolsOwnErrorsCount) {
             Lines({"package done", "tool refused tool-error worse"}));
 }
 
-TEST(MakeReport, EndOfTheToolCounts) {
+TEST(MakeReport, FailedAndKilledToolsAreReported) {
   const Json failed = {{"event", "exit"}, {"status", 1}};
   const Json killed = {{"event", "exit"}, {"signal", 11}};
   const Report report = Made({Sign(kFile, kPackagePayload)}, {}, {}, failed);
@@ -177,7 +177,7 @@ TEST(MakeReport, EndOfTheToolCounts) {
             Lines({"package refused not-reached", "tool refused tool-killed 11"}));
 }
 
-TEST(MakeReport, FileThatTheToolDidNotLookAt) {
+TEST(MakeReport, FileThatWasNotLookedAtHasAReason) {
   const auto item = [](int error, bool is_read_only, bool has_standard_input) {
     PackageFacts facts;
     facts.error = error;
@@ -207,7 +207,7 @@ TEST(MakeReport, DirectoryWithoutPackagesWasNotLookedAt) {
   EXPECT_EQ(ItemsOf(report), Lines({"file refused no-packages"}));
 }
 
-TEST(MakeReport, ToolThatSaysNothingOfAFileThatItCouldOpenIsNotTheTool) {
+TEST(MakeReport, FileOfASilentOrFailedToolIsNotSimulated) {
   const Report report = Made({});
   EXPECT_EQ(report.verdict, Verdict::kNotSimulated);
   EXPECT_EQ(ItemsOf(report), Lines({"tool refused tool-silent"}));
@@ -254,7 +254,7 @@ TEST(MakeReport, FileThatShrankWhileItWasReadHasNoResult) {
   EXPECT_EQ(report.items[0].reason.cause, &cause::kFileChanged);
 }
 
-TEST(MakeReport, EachVerdictHasItsStatus) {
+TEST(MakeReport, VerdictDecidesTheExitStatus) {
   EXPECT_EQ(StatusOf(Verdict::kSigned), 0);
   EXPECT_EQ(StatusOf(Verdict::kTrustedJar), 0);
   EXPECT_EQ(StatusOf(Verdict::kPartlySigned), 1);
@@ -264,7 +264,7 @@ TEST(MakeReport, EachVerdictHasItsStatus) {
   EXPECT_EQ(StatusOf(Verdict::kNotLookedAt), 4);
 }
 
-TEST(MakeReport, OddEventsAreNoHarm) {
+TEST(MakeReport, MalformedEventsAreIgnored) {
   const Report report = MakeReport(TakeApart({{{"event", 5}},
                                               {{"event", "sign"}, {"path", 7}, {"result", "no"}},
                                               {{"no", "event"}},

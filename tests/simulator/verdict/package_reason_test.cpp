@@ -52,7 +52,7 @@ PackageFacts Signed() {
 
 }  // namespace
 
-TEST(WhyRefused, OfADexFileTheLinesBeforeItTell) {
+TEST(WhyRefused, ExplainsARefusedDexFileByTheLineBeforeIt) {
   RunRecord run;
   run.is_dex_refused = true;
   EXPECT_EQ(Code(WhyRefused(run, Signed())), "dex-changed");
@@ -62,7 +62,7 @@ TEST(WhyRefused, OfADexFileTheLinesBeforeItTell) {
   EXPECT_EQ(Code(WhyRefused(run, Signed())), "dex-digest");
 }
 
-TEST(WhyRefused, OfWhatTheZipLibraryDoesNotOpenTheKindOfFileTells) {
+TEST(WhyRefused, ExplainsAnUnopenedArchiveByTheKindOfFile) {
   const auto why = [](FileKind kind) {
     PackageFacts facts;
     facts.kind = kind;
@@ -79,7 +79,7 @@ TEST(WhyRefused, OfWhatTheZipLibraryDoesNotOpenTheKindOfFileTells) {
             "empty-archive");
 }
 
-TEST(WhyRefused, WithoutARsaBlockTheOneThatIsThereTells) {
+TEST(WhyRefused, ExplainsAMissingRsaBlockByTheBlockFound) {
   const Lines errors = {"Can't extract RSA certificate: META-INF/CERT.RSA"};
   PackageFacts facts = Signed();
   EXPECT_EQ(Why(errors, facts), "signature-block-unreadable META-INF/CERT.RSA");
@@ -93,7 +93,7 @@ TEST(WhyRefused, WithoutARsaBlockTheOneThatIsThereTells) {
   EXPECT_EQ(Why(errors, facts), "dsa-key");
 }
 
-TEST(WhyRefused, BlockThatDoesNotParseMayBeOfAnotherKey) {
+TEST(WhyRefused, BlockThatCannotBeParsedMayHaveAnotherKey) {
   const Lines errors = {"Unknown certificate type", "file not verified: META-INF/CERT.SF"};
   PackageFacts facts = Signed();
   EXPECT_EQ(Why(errors, facts), "signature-block-malformed META-INF/CERT.RSA");
@@ -101,7 +101,7 @@ TEST(WhyRefused, BlockThatDoesNotParseMayBeOfAnotherKey) {
   EXPECT_EQ(Why(errors, facts), "ec-key");
 }
 
-TEST(WhyRefused, KeyThatCannotBeSetHasAnExponentThatIsReadAsOne) {
+TEST(WhyRefused, ExplainsAKeyThatCannotBeSet) {
   const Lines errors = {"RSA could not set key: 5", "file not verified: META-INF/CERT.SF"};
   const auto why = [&errors](int32_t exponent) {
     PackageFacts facts = Signed();
@@ -115,7 +115,7 @@ TEST(WhyRefused, KeyThatCannotBeSetHasAnExponentThatIsReadAsOne) {
   EXPECT_EQ(Why({"RSA could not set key: 9"}, Signed()), "no-memory");
 }
 
-TEST(WhyRefused, OfACertificate) {
+TEST(WhyRefused, ExplainsARefusedCertificate) {
   const Lines errors = {"RSA could not verify certificate: 7"};
   PackageFacts facts = Signed();
   EXPECT_EQ(Why(errors, facts), "certificate-changed");
@@ -138,7 +138,7 @@ TEST(WhyRefused, OfACertificate) {
   EXPECT_EQ(Why({"RSA could not verify certificate: 11"}, facts), "no-memory");
 }
 
-TEST(WhyRefused, OfASignature) {
+TEST(WhyRefused, ExplainsARefusedSignature) {
   const Lines errors = {"RSA could not verify data: 7"};
   PackageFacts facts = Signed();
   EXPECT_EQ(Why(errors, facts), "signature-wrong META-INF/CERT.RSA");
@@ -160,7 +160,7 @@ TEST(WhyRefused, OfASignature) {
   EXPECT_EQ(Why({"RSA could not verify data: 11"}, facts), "no-memory");
 }
 
-TEST(WhyRefused, OfAManifest) {
+TEST(WhyRefused, ExplainsARefusedManifest) {
   PackageFacts facts = Signed();
   EXPECT_EQ(Why({"Can't validate manifest.", "Can't validate manifest."}, facts),
             "manifest-changed");
@@ -178,7 +178,7 @@ TEST(WhyRefused, OfAManifest) {
             "android-manifest-text");
 }
 
-TEST(WhyRefused, OfWhatTheToolDoesNotMentionThePackageTells) {
+TEST(WhyRefused, ExplainsARefusalWithoutErrorsByThePackage) {
   PackageFacts facts = Signed();
   EXPECT_EQ(Why({}, facts), "signature-file-unreadable META-INF/CERT.SF");
   facts.jar.signature_files.clear();
@@ -200,7 +200,7 @@ TEST(WhyRefused, ErrorThatIsNotKnownIsQuoted) {
   EXPECT_EQ(Why({"something new"}, Signed()), "tool-error something new");
 }
 
-TEST(WhyRefused, CertificateThatNobodyElseReadsDoesNotCarryAnOwnSignature) {
+TEST(WhyRefused, CertificateThatCannotBeReadIsReportedAsChanged) {
   PackageFacts facts = Signed();
   facts.jar.certificate.reset();
   EXPECT_EQ(Why({"RSA could not verify certificate: 7"}, facts), "certificate-changed");

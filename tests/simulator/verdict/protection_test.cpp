@@ -58,7 +58,7 @@ std::string ChainOf(const std::vector<Item>& items) {
 
 }  // namespace
 
-TEST(Protection, IsByWhatWasComparedListedAndNot) {
+TEST(Protection, CountsEntriesAndBytesOfEachKind) {
   const Protection protection =
       FindProtection(Package(), {PackageItem(nullptr, true), LibraryItem(nullptr, true)});
   EXPECT_EQ(protection.verified.bytes, 11U);
@@ -70,7 +70,7 @@ TEST(Protection, IsByWhatWasComparedListedAndNot) {
   EXPECT_EQ(protection.unlisted_names, std::vector<std::string>({"added"}));
 }
 
-TEST(Protection, NothingIsVerifiedThatWasNotCompared) {
+TEST(Protection, OnlyComparedEntriesAreVerified) {
   const auto verified = [](bool package, bool library) {
     return FindProtection(Package(), {PackageItem(nullptr, package), LibraryItem(nullptr, library)})
         .verified.bytes;
@@ -81,7 +81,7 @@ TEST(Protection, NothingIsVerifiedThatWasNotCompared) {
 }
 
 // The tool checked the library beside the package. The library inside the package differs from it.
-TEST(Protection, EntryThatIsOtherThanListedIsNotVerified) {
+TEST(Protection, EntryThatDiffersFromTheManifestIsNotVerified) {
   PackageFacts facts = Package();
   facts.entries[1].digest = EntryDigest::kDiffers;
   facts.entries[3].digest = EntryDigest::kDiffers;
@@ -130,7 +130,7 @@ TEST(Chain, IsNotBrokenByAnotherItem) {
   EXPECT_EQ(ChainOf({PackageItem(nullptr), tool}), "hhhhh");
 }
 
-TEST(Chain, SaysWhatStandsThereOrWhyItBreaks) {
+TEST(Chain, ShowsTheValueOfEachLinkOrWhyItBreaks) {
   const std::vector<Link> chain =
       MakeChain(Package(), With({PackageItem(&cause::kManifestChanged)}));
   EXPECT_EQ(chain[0].text, "RSA-2048");
@@ -146,7 +146,7 @@ TEST(Chain, SaysWhatStandsThereOrWhyItBreaks) {
       std::string("lib/arm64/a.so: ") + cause::kLibraryDigest.reason);
 }
 
-TEST(Chain, SaysNothingOfWhatIsNotThere) {
+TEST(Chain, HasNoTextForMissingFacts) {
   Report report = With({PackageItem(&cause::kUnsigned)});
   report.signer.reset();
   report.key.reset();

@@ -62,7 +62,7 @@ TEST(Warnings, GoodPackageHasNone) { EXPECT_EQ(Warnings(Good()), Lines()); }
 
 // ---- Other programs read other values than the tool.
 
-TEST(Warnings, CertificateThatShowsAnotherKeyThanTheKernelGets) {
+TEST(Warnings, CertificateWithAnotherKeyThanTheKernelsIsReported) {
   PackageFacts facts = Good();
   facts.jar.certificate->key.modulus_sha256 = kOther;
   EXPECT_EQ(Warnings(facts), Lines({"certificate-other-key: modulus SHA-256 digest: " + kOther}));
@@ -72,14 +72,14 @@ TEST(Warnings, CertificateThatShowsAnotherKeyThanTheKernelGets) {
 }
 
 // The key that the kernel got counts, even if the file now shows another key.
-TEST(Warnings, KernelThatGotAnotherKeyThanTheCertificateShows) {
+TEST(Warnings, CertificateIsComparedWithTheKeyThatTheKernelGot) {
   Report report = ReportOf(Good());
   report.key->sha256 = kOther;
   EXPECT_EQ(Warnings(Good(), report),
             Lines({"certificate-other-key: modulus SHA-256 digest: " + kModulus}));
 }
 
-TEST(Warnings, WithoutAKeyThereIsNoneToDifferFrom) {
+TEST(Warnings, PackageWithoutAKeyHasNone) {
   PackageFacts facts = Good();
   facts.jar.key.reset();
   facts.jar.block.is_whole = false;
@@ -88,7 +88,7 @@ TEST(Warnings, WithoutAKeyThereIsNoneToDifferFrom) {
   EXPECT_EQ(Warnings(facts, report), Lines());
 }
 
-TEST(Warnings, BlockThatOthersReadInAnotherWay) {
+TEST(Warnings, BlockThatOthersReadDifferentlyIsReported) {
   PackageFacts facts = Good();
   facts.jar.block.is_whole = false;
   EXPECT_EQ(Warnings(facts), Lines({"block-ambiguous: it is not strict DER"}));
@@ -102,7 +102,7 @@ TEST(Warnings, BlockThatOthersReadInAnotherWay) {
   EXPECT_EQ(cause::kBlockAmbiguous.severity, Severity::kAlarm);
 }
 
-TEST(Warnings, PackageNameThatTheInstallerReadsInAnotherWay) {
+TEST(Warnings, OtherPackageNameOfTheInstallerIsReported) {
   PackageFacts facts = Good();
   facts.manifest.installer_name = "com.evil";
   EXPECT_EQ(Warnings(facts), Lines({"other-package-name: \"com.evil\""}));
@@ -112,7 +112,7 @@ TEST(Warnings, PackageNameThatTheInstallerReadsInAnotherWay) {
 
 // ---- Signers.
 
-TEST(Warnings, SeveralSigners) {
+TEST(Warnings, SeveralSignersAreReported) {
   PackageFacts facts = Good();
   facts.jar.block.signer_count = 2;
   EXPECT_EQ(Warnings(facts), Lines({"several-signers: META-INF/CERT.SF"}));
@@ -131,7 +131,7 @@ TEST(Warnings, ForgeableKeyIsNotSaidTwice) {
   EXPECT_EQ(Warnings(facts, report), Lines());
 }
 
-TEST(Warnings, OtherKeyOfAnyNewerSigner) {
+TEST(Warnings, OtherKeyOfAnyNewerSignerIsReported) {
   PackageFacts facts = Good();
   const CertificateFacts other = CertificateWith("CN=other", kOther, "other key");
   facts.newer = {{"v2", kJarSigner}, {"v3", kJarSigner}};
@@ -145,7 +145,7 @@ TEST(Warnings, OtherKeyOfAnyNewerSigner) {
 
 // The key of a v2 or v3 signer must have the modulus that the kernel gets. It must also be the key
 // in the JAR signer's certificate. Otherwise the warning other-key reports it.
-TEST(Warnings, OtherKeyWithAPartOfTheJarSigners) {
+TEST(Warnings, KeyThatMatchesOnlyInPartIsReported) {
   PackageFacts facts = Good();
   facts.newer = {{"v2", CertificateWith("CN=other", kModulus, "other key")}};
   EXPECT_EQ(Warnings(facts).size(), 1U);
@@ -159,7 +159,7 @@ TEST(Warnings, OtherKeyWithAPartOfTheJarSigners) {
   EXPECT_EQ(Warnings(facts).size(), 1U);
 }
 
-TEST(Warnings, OtherKeyThanAnEcSigners) {
+TEST(Warnings, KeyOtherThanTheEcSignersIsReported) {
   PackageFacts facts = Good();
   facts.jar.key.reset();
   facts.jar.certificate->key = {"EC", 256, "ec key", ""};
@@ -173,7 +173,7 @@ TEST(Warnings, OtherKeyThanAnEcSigners) {
   EXPECT_EQ(Warnings(facts, report), Lines());
 }
 
-TEST(Warnings, SchemesThatWereStripped) {
+TEST(Warnings, StrippedSchemesAreReported) {
   PackageFacts facts = Good();
   facts.jar.claimed_schemes = "2, 3";
   EXPECT_EQ(Warnings(facts), Lines({"schemes-stripped: v2, v3"}));
@@ -187,7 +187,7 @@ TEST(Warnings, SchemesThatWereStripped) {
 
 // ---- The file.
 
-TEST(Warnings, FileWithPartsThatAreNotLookedInto) {
+TEST(Warnings, PartsThatAreNotLookedIntoAreReported) {
   PackageFacts facts = Good();
   facts.has_damaged_signing_block = true;
   facts.too_long = {"a", "b"};
@@ -196,7 +196,7 @@ TEST(Warnings, FileWithPartsThatAreNotLookedInto) {
   EXPECT_EQ(Warnings(facts, ReportOf(facts, ItemKind::kJar)), expected);
 }
 
-TEST(Warnings, EntriesThatAreNotListedOrDamaged) {
+TEST(Warnings, UnlistedAndDamagedEntriesAreReported) {
   PackageFacts facts = Good();
   facts.entries = {{{"listed", 1, false}, true, false},
                    {{"META-INF/A.SF", 10, false}, false, true},
@@ -213,7 +213,7 @@ TEST(Warnings, EntriesThatAreNotListedOrDamaged) {
   EXPECT_EQ(Warnings(facts), Lines({"unlisted-entries: 1 entry (1 byte)"}));
 }
 
-TEST(Warnings, NamesThatInstallersDoNotTake) {
+TEST(Warnings, EntriesThatAreNotLaidOutAreReported) {
   RunRecord run;
   run.not_laid_out = {"lib/a.so"};
   EXPECT_EQ(Warnings(Good(), ReportOf(Good()), run), Lines({"not-laid-out: 1 entry: lib/a.so"}));
@@ -222,7 +222,7 @@ TEST(Warnings, NamesThatInstallersDoNotTake) {
             Lines({"not-laid-out: 2 entries: lib/a.so, ..."}));
 }
 
-TEST(Warnings, OfAJarAreNotThoseOfAPackage) {
+TEST(Warnings, PackageWarningsDoNotAppearForAJar) {
   PackageFacts facts = Good();
   facts.jar.certificate->key.modulus_sha256 = kOther;
   facts.jar.block.signer_count = 2;
@@ -234,7 +234,7 @@ TEST(Warnings, OfAJarAreNotThoseOfAPackage) {
 
 // ---- Entries that are not as the manifest lists them.
 
-TEST(Warnings, EntriesThatAreOtherThanListedMissingOrNotCompared) {
+TEST(Warnings, ChangedMissingAndUncomparedEntriesAreReported) {
   PackageFacts facts = Good();
   facts.entries = {{{"same", 1, false}, true, false, EntryDigest::kMatches},
                    {{"a", 1, false}, true, false, EntryDigest::kDiffers},
@@ -247,7 +247,7 @@ TEST(Warnings, EntriesThatAreOtherThanListedMissingOrNotCompared) {
   EXPECT_EQ(cause::kEntriesNotCompared.severity, Severity::kAlarm);
 }
 
-TEST(Warnings, WhatAnItemSaysIsNotSaidTwice) {
+TEST(Warnings, FaultThatAnItemReportsIsNotRepeated) {
   PackageFacts facts = Good();
   facts.entries = {{{"classes.dex", 1, false}, true, false, EntryDigest::kDiffers},
                    {{"lib/arm64-v8a/a.so", 1, false}, true, false, EntryDigest::kDiffers},
@@ -264,7 +264,7 @@ TEST(Warnings, WhatAnItemSaysIsNotSaidTwice) {
 
 // ---- Keys that nobody should sign a release with.
 
-TEST(Warnings, KeyThatIsTooShort) {
+TEST(Warnings, KeyOfFewerThan2048BitsIsReported) {
   PackageFacts facts = Good();
   facts.jar.key->bits = 2047;
   EXPECT_EQ(Warnings(facts), Lines({"weak-key: 2047"}));
@@ -272,7 +272,7 @@ TEST(Warnings, KeyThatIsTooShort) {
   EXPECT_EQ(Warnings(facts), Lines());
 }
 
-TEST(Warnings, DebugCertificate) {
+TEST(Warnings, DebugCertificateIsReported) {
   PackageFacts facts = Good();
   facts.jar.certificate->subject = "C=US, O=Android, CN=Android Debug";
   EXPECT_EQ(Warnings(facts), Lines({"debug-key: "}));
@@ -282,7 +282,7 @@ TEST(Warnings, DebugCertificate) {
   EXPECT_EQ(Warnings(facts), Lines());
 }
 
-TEST(Warnings, DigestsForWhichCollisionsAreKnown) {
+TEST(Warnings, DigestsWithKnownCollisionsAreReported) {
   PackageFacts facts = Good();
   facts.jar.certificate->signature_algorithm = "SHA256withRSA";
   facts.jar.block.digest = "SHA256";
@@ -314,7 +314,7 @@ TEST(Warnings, DigestsForWhichCollisionsAreKnown) {
 
 // The v2 signer's certificate has the JAR signer's key, but is another certificate. Phones use the
 // v2 signer's certificate.
-TEST(Warnings, CertificateOfANewerScheme) {
+TEST(Warnings, CertificateOfANewerSchemeIsCheckedAsWell) {
   PackageFacts facts = Good();
   NewerSignerFacts newer = {"v2", *facts.jar.certificate};
   facts.newer = {newer};
@@ -336,7 +336,7 @@ TEST(Warnings, CertificateOfANewerScheme) {
 
 // `date -u -d @1000000000` prints 2001-09-09 01:46:40. The certificate is still valid in the second
 // that notAfter names.
-TEST(Warnings, CertificateThatExpired) {
+TEST(Warnings, ExpiredCertificateIsReported) {
   const auto told = [](std::optional<int64_t> end, int64_t now) {
     PackageFacts facts = Good();
     facts.jar.certificate->not_after = end;
