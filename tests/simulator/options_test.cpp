@@ -258,7 +258,7 @@ TEST(Options, FileThatLooksLikeAnOptionIsNamed) {
             "there is no option -dash.apk; for a file of this name, write ./-dash.apk");
 }
 
-TEST(Options, HelpNamesOptionsAndEveryStatus) {
+TEST(Options, HelpNamesEveryOptionAndStatus) {
   const ProcessResult result = Told({"--help"});
   EXPECT_EQ(result.status, 0);
   EXPECT_EQ(result.errors, "");
@@ -275,6 +275,9 @@ TEST(Options, HelpNamesOptionsAndEveryStatus) {
                            "-0,--null ",
                            "--install [=ABI]",
                            "--strict ",
+                           "--installer WHEN",
+                           "--api LEVEL[-LEVEL]",
+                           "--verify ",
                            "--quiet ",
                            "--verbose ",
                            "--signer SHA256",

@@ -73,18 +73,6 @@ TEST(SignedBytes, AreNotTrustedIfTheyCannotBeReadInTime) {
   EXPECT_FALSE(kept.Add(file, kPassed));
 }
 
-TEST(SignedBytes, AreTrustedOnlyInLaterRunsIfNotShared) {
-  const TempDir directory;
-  const std::string file = directory.Write("file", ToBytes("abc"));
-  SignedBytes first(directory / "state", false);
-  ASSERT_TRUE(first.Load());
-  EXPECT_TRUE(first.Add(file, kLater));
-  EXPECT_FALSE(first.Holds(file, kLater));
-  SignedBytes second(directory / "state", false);
-  ASSERT_TRUE(second.Load());
-  EXPECT_TRUE(second.Holds(file, kLater));
-}
-
 // Reading a pipe would wait forever, and reading a device would never end.
 TEST(SignedBytes, AreNotReadFromPipesAndDevices) {
   const TempDir directory;
@@ -110,7 +98,7 @@ TEST(SignedBytes, AreKeptByTheirDigest) {
   EXPECT_TRUE(second.Holds(file, kLater));
 }
 
-TEST(SignedBytes, AreNotTrustedInThisRunIfNotShared) {
+TEST(SignedBytes, AreTrustedOnlyInLaterRunsIfNotShared) {
   const TempDir directory;
   const std::string file = directory.Write("file", ToBytes("abc"));
   SignedBytes none("", false);

@@ -12,22 +12,25 @@ Item Library(const Cause* why) {
 
 }  // namespace
 
-TEST(Summary, CountsFilesByVerdict) {
+TEST(Summary, CountsEachVerdict) {
   EXPECT_EQ(Summary({Verdict::kSigned, Verdict::kRefused, Verdict::kSigned, Verdict::kNotLookedAt}),
             "4 files: 2 signed, 1 refused, 1 not looked at");
   EXPECT_EQ(Summary({Verdict::kTrustedJar}), "1 file: 1 trusted JAR");
-  const std::vector<Verdict> all = {
-      Verdict::kSigned,        Verdict::kTrustedJar,  Verdict::kPartlySigned, Verdict::kRefused,
-      Verdict::kNotTrustedJar, Verdict::kNotLookedAt, Verdict::kNotSimulated};
+  const std::vector<Verdict> all = {Verdict::kSigned,         Verdict::kOtherSigner,
+                                    Verdict::kTrustedJar,     Verdict::kPartlySigned,
+                                    Verdict::kNotInstallable, Verdict::kNotAccepted,
+                                    Verdict::kRefused,        Verdict::kNotTrustedJar,
+                                    Verdict::kNotLookedAt,    Verdict::kNotSimulated};
   std::vector<Verdict> twice = all;
   twice.insert(twice.end(), all.begin(), all.end());
-  EXPECT_EQ(
-      Summary(all),
-      "7 files: 1 signed, 1 trusted JAR, 1 partly signed, 1 refused, 1 JAR not trusted, 1 not "
-      "looked at, 1 not simulated");
+  EXPECT_EQ(Summary(all),
+            "10 files: 1 signed, 1 signed for another signer, 1 trusted JAR, 1 partly signed, 1 "
+            "not installable, 1 not accepted, 1 refused, 1 JAR not trusted, 1 not looked at, 1 not "
+            "simulated");
   EXPECT_EQ(Summary(twice),
-            "14 files: 2 signed, 2 trusted JARs, 2 partly signed, 2 refused, 2 JARs not trusted, 2 "
-            "not looked at, 2 not simulated");
+            "20 files: 2 signed, 2 signed for another signer, 2 trusted JARs, 2 partly signed, 2 "
+            "not installable, 2 not accepted, 2 refused, 2 JARs not trusted, 2 not looked at, 2 "
+            "not simulated");
   EXPECT_EQ(Summary({}), "0 files");
 }
 

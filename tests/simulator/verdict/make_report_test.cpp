@@ -254,10 +254,13 @@ TEST(MakeReport, FileThatShrankWhileItWasReadHasNoResult) {
   EXPECT_EQ(report.items[0].reason.cause, &cause::kFileChanged);
 }
 
-TEST(MakeReport, VerdictDecidesTheExitStatus) {
+TEST(MakeReport, EachVerdictHasItsExitStatus) {
   EXPECT_EQ(StatusOf(Verdict::kSigned), 0);
+  EXPECT_EQ(StatusOf(Verdict::kOtherSigner), 0);
   EXPECT_EQ(StatusOf(Verdict::kTrustedJar), 0);
   EXPECT_EQ(StatusOf(Verdict::kPartlySigned), 1);
+  EXPECT_EQ(StatusOf(Verdict::kNotInstallable), 1);
+  EXPECT_EQ(StatusOf(Verdict::kNotAccepted), 1);
   EXPECT_EQ(StatusOf(Verdict::kRefused), 1);
   EXPECT_EQ(StatusOf(Verdict::kNotTrustedJar), 1);
   EXPECT_EQ(StatusOf(Verdict::kNotSimulated), 3);
