@@ -223,9 +223,9 @@ WRAPS_ON_PURPOSE void mpi_montmul(mpi* A, const mpi* B, const mpi* N, unsigned i
   }
   for (int i = 0; i <= n; ++i) A->p[i] = d[i];
 
-  // Deliberate: n limbs are always subtracted, so that both cases take about the same time. If the
-  // product is below N, it is subtracted from T, and the result is not used. T still contains the
-  // product in the limbs from index n, so T is not less than the product and absorbs the borrow.
+  // Deliberate: n limbs are always subtracted, so that both cases take about the same time. If A,
+  // the product, is below N, A is subtracted from T, and the difference is not used. T has A in its
+  // limbs from index n, so T is not less than A, and these limbs absorb the borrow.
   if (mpi_compare_abs(A, N) >= 0) {
     subtract_with_borrow(n, N->p, A->p);
   } else {
@@ -301,8 +301,9 @@ WRAPS_ON_PURPOSE void subtract_with_borrow(int count, const uint32_t* s, uint32_
 
 // Adds s * b + c to d over `kCount` limbs; returns the carry. A vector has one limb in each lane. A
 // product of limbs is the sum of four products of half limbs. Each of the four is computed for all
-// lanes at once. The sums do not wrap: (2^16 - 1)^2, the greatest product of half limbs, plus two
-// half limbs fits in 32 bits.
+// lanes at once. The sums rx, ry and r1 do not wrap: (2^16 - 1)^2, the greatest product of half
+// limbs, plus two half limbs fits in 32 bits. The sums with c and d may wrap; their carries go to
+// c.
 template <int kCount>
 WRAPS_ON_PURPOSE uint32_t multiply_add(const uint32_t* s, uint32_t* d, uint32_t b, uint32_t c) {
   constexpr int kLanes = std::min(kCount, 4);

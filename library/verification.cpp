@@ -131,7 +131,7 @@ bool HasEntry(Apk& apk, const std::string& prefix, const std::string& suffix) {
 __attribute__((format(printf, 3, 0))) int HearAndLog(int priority, const char* tag,
                                                      const char* format, va_list arguments) {
   char text[kLogTextSize];
-  // NOLINTNEXTLINE(clang-analyzer-valist.Uninitialized): it follows LogText, and misses va_start.
+  // NOLINTNEXTLINE(clang-analyzer-valist.Uninitialized): it enters LogText, but misses va_start.
   vsnprintf(text, sizeof(text), format, arguments);
   if (tag != nullptr && strcmp(tag, kLogTag) == 0) Hear(text);
   return __android_log_write(priority, tag, text);

@@ -1,6 +1,7 @@
 // Packages that other programs read differently than the tool, for example with another signer.
-// Wherever the simulator names a key, it is the key that the kernel got. The line of the verdict
-// also contains the alarms, which are the most serious warnings.
+// The key that the simulator names as the signer's is the key that the tool reads. Only a warning
+// names another key, the one that other programs find. The line of the verdict also contains the
+// alarms, which are the most serious warnings.
 #include <gmpxx.h>
 #include <gtest/gtest.h>
 #include <openssl/mem.h>
@@ -200,7 +201,9 @@ TEST(PackageReadInTwoWays, TwoZerosBeforeTheModulusMakeAnotherKey) {
   EXPECT_EQ(told.Warnings(), Codes({"certificate-other-key"}));
 }
 
-// Other programs accept an exponent of five bytes, so they read the certificate.
+// The simulator's X.509 reader, libcrypto, accepts an exponent of five bytes and finds the victim's
+// key. In the tool, the fifth byte becomes part of the modulus length. The tool therefore reads
+// another key, and the signature does not verify.
 TEST(PackageReadInTwoWays, CertificateWithA5ByteExponentShowsAnotherKey) {
   Certificate certificate;
   certificate.public_key_info =
