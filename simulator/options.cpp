@@ -135,9 +135,9 @@ void AddPhone(CLI::App* app, Options* options) {
   PhoneSettings* const phone = &options->run.phone;
   app->add_option_function<std::string>(
          "--integrity", [phone](const std::string& text) { phone->integrity = Split(text, ','); },
-         "The tool's integrity value, one TEXT per reading;\n"
-         "the last one repeats, \"missing\" is no file\n"
-         "[default: 1f]")
+         "The tool's integrity value: a TEXT for each\n"
+         "reading. The last TEXT repeats; \"missing\" means\n"
+         "that the file does not exist [default: 1f]")
       ->type_name("TEXT[,TEXT]...");
   AddKernelAnswer(app, "--sign-errno", &phone->sign_errno,
                   "The kernel answers every signing with this\n"
@@ -194,16 +194,17 @@ void AddInstallation(CLI::App* app, Options* options) {
     return is_known ? std::string() : name + " is not one of phone, all, arm64, arm and no";
   };
   app->add_option_function<std::string>(kInstall, install,
-                                        "First lay out the libraries, as an installer\n"
-                                        "does, in a temporary directory: for phone, all,\n"
-                                        "arm64 or arm; \"no\" does not [default: phone, if\n"
-                                        "there are none beside the package]")
+                                        "First extract the libraries, as an installer\n"
+                                        "does, into a temporary directory: for phone,\n"
+                                        "all, arm64 or arm; \"no\" extracts nothing\n"
+                                        "[default: phone, if no libraries are beside the\n"
+                                        "package]")
       ->type_name("[=ABI]")
       ->check(check)
       ->take_last();
   app->add_flag("--strict", options->judge.is_strict,
-                "A library that is not beside its package counts\n"
-                "as refused");
+                "A library that is not beside its package, or is\n"
+                "damaged in it, counts as refused");
 }
 
 void AddInstaller(CLI::App* app, Options* options) {

@@ -39,7 +39,7 @@ MODULE_LICENSE("GPL");
 
 static char integrity[64] = "1f";
 module_param_string(integrity, integrity, sizeof(integrity), 0644);
-MODULE_PARM_DESC(integrity, "texts for the next openings, separated by commas; the last text is used again");
+MODULE_PARM_DESC(integrity, "contents of the integrity file, one for each opening, separated by commas; the last one repeats");
 
 static int sign_errno;
 module_param(sign_errno, int, 0644);

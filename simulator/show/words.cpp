@@ -128,7 +128,7 @@ std::string NameOf(const Item& item) { return item.kind == ItemKind::kKey ? "key
 std::string OutcomeOf(const Item& item, Verdict verdict) {
   std::string reason = item.reason.Text();
   if (item.state == ItemState::kDone) {
-    if (item.kind == ItemKind::kPackage) return "signed with the payload of that key";
+    if (item.kind == ItemKind::kPackage) return "signed with the payload of the signer's key";
     if (item.kind == ItemKind::kJar) return "signed, without data";
     if (item.kind == ItemKind::kKey) return "registered for " + item.name;
     return "signed";

@@ -82,7 +82,7 @@ inline const std::string& PathForTool(const Report& report) {
 
 // The note in a report whose `installed` is not empty.
 inline constexpr char kLaidOutText[] =
-    "its libraries were laid out beside it, as an installer does; --install=no turns this off";
+    "its libraries were extracted beside it, as an installer does; --install=no turns this off";
 
 // True if the cure, which says what to do, is shown below the item. It is not shown if nothing is
 // wrong, or for a consequence of another cause. If consecutive items have the same cause, only the

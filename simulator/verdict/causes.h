@@ -55,7 +55,7 @@ namespace cause {
 // ---- The tool did not look at the file.
 inline constexpr Cause kFileMissing = {"file-missing", Group::kNotLookedAt, Severity::kUnseen,
     ChainLink::kKey, "", "there is no such file",
-    "Check the name; a relative one counts from the directory in which the tool is run."};
+    "Check the name. A relative name starts at the directory in which the tool is run."};
 inline constexpr Cause kFileNoPermission = {"file-no-permission", Group::kNotLookedAt,
     Severity::kUnseen, ChainLink::kKey, "", "there is no permission to read it",
     "Give the user who runs the tool the right to read the file and to enter its directories."};
@@ -86,7 +86,7 @@ inline constexpr Cause kToolTimedOut = {"tool-timed-out", Group::kSimulation, Se
     "as its integrity value is ffffffff. It waits for a while if another process holds a lease "
     "on the file. A large file may need a larger --timeout."};
 inline constexpr Cause kStandInsMissing = {"stand-ins-missing", Group::kSimulation,
-    Severity::kFailed, ChainLink::kKey, "", "the stand-ins were not loaded into %s",
+    Severity::kFailed, ChainLink::kKey, "", "the simulator's libraries were not loaded into %s",
     "Check --tool: it has to be a dynamically linked program for this processor or for --runner."};
 inline constexpr Cause kToolSilent = {"tool-silent", Group::kSimulation, Severity::kFailed,
     ChainLink::kKey, "", "the tool logged nothing and did nothing, though the file can be opened",
@@ -95,7 +95,7 @@ inline constexpr Cause kStateNotKept = {"state-not-kept", Group::kSimulation, Se
     ChainLink::kKey, "", "the signed files cannot be remembered in %s",
     "Make the --state directory writable."};
 inline constexpr Cause kNotInstalled = {"not-installed", Group::kSimulation, Severity::kFailed,
-    ChainLink::kKey, "", "its libraries cannot be laid out: %s",
+    ChainLink::kKey, "", "its libraries cannot be extracted beside it: %s",
     "Free space in the directory for temporary files (TMPDIR), or give --install=no."};
 inline constexpr Cause kNotBegun = {"not-begun", Group::kSimulation, Severity::kFailed,
     ChainLink::kKey, "", "no file could be simulated: %s",
@@ -111,7 +111,7 @@ inline constexpr Cause kFolder = {"folder", Group::kFile, Severity::kRefused, Ch
     "Name the package inside it, or give --recursive."};
 inline constexpr Cause kPackageDirectory = {"package-directory", Group::kFile, Severity::kRefused,
     ChainLink::kKey, "`OpenArchiveFd(`", "it is a directory with %s in it",
-    "Name them all, a base and its splits: DIRECTORY/*.apk; or give --recursive."};
+    "Name every package in it, the base and its splits: DIRECTORY/*.apk. Or give --recursive."};
 inline constexpr Cause kSpecialFile = {"special-file", Group::kFile, Severity::kRefused,
     ChainLink::kKey, "`OpenArchiveFd(`", "it is a device, a pipe or a socket", "Name a file."};
 inline constexpr Cause kEmptyFile = {"empty-file", Group::kFile, Severity::kRefused,
@@ -228,7 +228,7 @@ inline constexpr Cause kCertificateIssued = {"certificate-issued", Group::kSigna
     "published app."};
 inline constexpr Cause kCertificateDigest = {"certificate-digest", Group::kSignature,
     Severity::kRefused, ChainLink::kCertificate, "`RSA could not verify certificate`",
-    "its certificate is signed with %s, and this tool reads MD5, SHA-1 and SHA-256 with RSA",
+    "its certificate is signed with %s, not RSA PKCS#1 v1.5 with MD5, SHA-1 or SHA-256",
     "Certify the same key with SHA-256, and sign again: keytool -selfcert -alias ALIAS -sigalg "
     "SHA256withRSA -validity 10000 -keystore KEYSTORE. This makes another signer: phones refuse "
     "the package as an update of a published app. Without -sigalg, keytool uses SHA-384: in JDK "
@@ -239,11 +239,11 @@ inline constexpr Cause kCertificateChanged = {"certificate-changed", Group::kSig
     "Sign the package again; if the error appears again, make a new certificate for the key."};
 inline constexpr Cause kSignedAttributes = {"signed-attributes", Group::kSignature,
     Severity::kRefused, ChainLink::kSignatureFile, "`RSA could not verify data`", "its signature "
-    "covers signed attributes, which jarsigner writes and this tool does not support",
+    "covers signed attributes, which new jarsigner versions write and this tool refuses",
     "Sign it with apksigner; no option of jarsigner helps."};
 inline constexpr Cause kSignatureDigest = {"signature-digest", Group::kSignature,
     Severity::kRefused, ChainLink::kSignatureFile, "`RSA could not verify data`",
-    "it is signed over %s, and this tool reads MD5, SHA-1 and SHA-256",
+    "its signature uses %s, not RSA PKCS#1 v1.5 with MD5, SHA-1 or SHA-256",
     "Sign it with SHA-256 and RSA PKCS#1 v1.5, as apksigner does."};
 inline constexpr Cause kSignatureFileChanged = {"signature-file-changed", Group::kSignature,
     Severity::kRefused, ChainLink::kSignatureFile, "`RSA could not verify data`",
@@ -258,7 +258,7 @@ inline constexpr Cause kManifestChanged = {"manifest-changed", Group::kSignature
     "Sign the package again, as the last step that changes it."};
 inline constexpr Cause kManifestDigest = {"manifest-digest", Group::kSignature, Severity::kRefused,
     ChainLink::kManifest, "`Can't validate manifest`",
-    "its signature file has no digest of the manifest that this tool reads: SHA-1 or SHA-256",
+    "its signature file has no SHA-1 or SHA-256 digest of the manifest",
     "Sign it with SHA-256 digests, as apksigner does."};
 inline constexpr Cause kManifestMalformed = {"manifest-malformed", Group::kSignature,
     Severity::kRefused, ChainLink::kManifest, "`Can't load manifest`",
@@ -277,7 +277,7 @@ inline constexpr Cause kDexNotListed = {"dex-not-listed", Group::kSignature, Sev
     "as the last step that changes it. If you did not change it yourself, do not trust it."};
 inline constexpr Cause kDexDigest = {"dex-digest", Group::kSignature, Severity::kRefused,
     ChainLink::kEntries, "`verifyData:`",
-    "the manifest has no digest of classes.dex that this tool reads: SHA-1 or SHA-256",
+    "the manifest has no SHA-1 or SHA-256 digest of classes.dex",
     "Sign it with SHA-256 digests, as apksigner does."};
 inline constexpr Cause kEntryEncrypted = {"entry-encrypted", Group::kSignature, Severity::kRefused,
     ChainLink::kEntries, "", "%s is encrypted, and no phone decrypts it",
@@ -293,7 +293,7 @@ inline constexpr Cause kKernelRefused = {"kernel-refused", Group::kKernel, Sever
 inline constexpr Cause kIntegrityZero = {"integrity-zero", Group::kKernel, Severity::kRefused,
     ChainLink::kNone, "`VELT can't sign a`",
     "the tool's own integrity value settled at 0, so the tool may not sign", "The file was good. "
-    "Look at the domain that the tool is started from: its value must be neither 0 nor ffffffff."};
+    "Check the domain that starts the tool: the tool's value must be neither 0 nor ffffffff."};
 inline constexpr Cause kIntegrityMissing = {"integrity-missing", Group::kKernel, Severity::kRefused,
     ChainLink::kNone, "`VELT can't sign a`",
     "the tool has no integrity value: /proc/self/integrity/value does not exist",
@@ -319,7 +319,7 @@ inline constexpr Cause kLibraryNotListed = {"library-not-listed", Group::kLibrar
     "Sign the package again, as the last step that changes it."};
 inline constexpr Cause kLibraryDigest = {"library-digest", Group::kLibrary, Severity::kRefused,
     ChainLink::kEntries, "`verifyData:`",
-    "the manifest has no digest of it that this tool reads: SHA-1 or SHA-256",
+    "the manifest has no SHA-1 or SHA-256 digest of it",
     "Sign the package with SHA-256 digests, as apksigner does."};
 inline constexpr Cause kLibraryNoPermission = {"library-no-permission", Group::kLibrary,
     Severity::kRefused, ChainLink::kNone, "`Can't open file`", "there is no permission to read it",
@@ -338,19 +338,19 @@ inline constexpr Cause kLibraryInPackage = {"library-in-package", Group::kLibrar
 inline constexpr Cause kLibraryNotInstalled = {"library-not-installed", Group::kLibrary,
     Severity::kAbsent, ChainLink::kNone, "`Can't open file`",
     "no libraries for its processor are beside the package", "If the phone has another processor, "
-    "there is nothing to do. To lay out the libraries of all processors, give --install=all."};
+    "there is nothing to do. To extract the libraries of all processors, use --install=all."};
 inline constexpr Cause kLibraryNotLaidOut = {"library-not-laid-out", Group::kLibrary,
     Severity::kNothing, ChainLink::kNone, "`Can't open file`",
-    "it is for another processor than the phone's (--install=all lays out the libraries of all "
+    "it is for another processor than the phone's (--install=all extracts the libraries of all "
     "processors)",
     "Nothing to do: phones install the libraries of one processor."};
 inline constexpr Cause kLibraryInSubdirectory = {"library-in-subdirectory", Group::kLibrary,
     Severity::kAbsent, ChainLink::kNone, "`Can't open file`",
-    "it is in a subdirectory of its ABI: the tool looks for %s, and installers do not put it there",
+    "it is in a subdirectory of its ABI: installers do not extract it to %s, where the tool looks",
     "Build the package again with its libraries as lib/ABI/NAME."};
 inline constexpr Cause kLibraryMissing = {"library-missing", Group::kLibrary, Severity::kAbsent,
     ChainLink::kNone, "`Can't open file`", "it is not beside the package, but other libraries are",
-    "Install the package again, unless the installer leaves it out on purpose."};
+    "Install the package again, unless the installer leaves this library out on purpose."};
 inline constexpr Cause kLibraryOtherAbi = {"library-other-abi", Group::kLibrary, Severity::kNothing,
     ChainLink::kNone, "", "the tool knows no directory for its ABI",
     "Nothing to do."};
@@ -414,8 +414,8 @@ inline constexpr Cause kSignerNotVerified = {"signer-not-verified", Group::kGate
     "signature (%s)", "First fix the reason why the file is refused."};
 inline constexpr Cause kSignerDiffers = {"signer-differs", Group::kGate, Severity::kRefused,
     ChainLink::kNone, "", "the files of a package must have one signer: %s",
-    "Sign all files of the package with one key and certificate. Check its other builds in "
-    "separate runs."};
+    "Sign all files of the package with one key and certificate. Check other builds of the "
+    "package in separate runs."};
 inline constexpr Cause kWarningsRefused = {"warnings-refused", Group::kGate, Severity::kRefused,
     ChainLink::kNone, "", "a warning counts as a refusal (--werror): %s",
     "See what to do about each warning."};
@@ -424,11 +424,11 @@ inline constexpr Cause kWarningsRefused = {"warnings-refused", Group::kGate, Sev
 inline constexpr Cause kOtherKey = {"other-key", Group::kWarning, Severity::kWarning,
     ChainLink::kNone, "", "%s is made with another key than the JAR signature: phones install the "
     "package for that other key, but the kernel gets the JAR signature's key", "Sign all schemes "
-    "with one key. Only the newer schemes use a rotated key. If you did not build it, do not "
+    "with one key. A rotated key signs only the newer schemes. If you did not build it, do not "
     "trust it."};
 inline constexpr Cause kSchemesStripped = {"schemes-stripped", Group::kWarning, Severity::kWarning,
-    ChainLink::kNone, "", "the signature file says that the package is signed with %s as well, and "
-    "it is not: phones do not install it",
+    ChainLink::kNone, "", "the signature file says that the package is also signed with %s, but "
+    "it is not: phones do not install the package",
     "Sign the package again, as the last step that changes it."};
 inline constexpr Cause kSigningBlockDamaged = {"signing-block-damaged", Group::kWarning,
     Severity::kWarning, ChainLink::kNone, "", "its signing block (v2 and later) is damaged",
@@ -449,7 +449,7 @@ inline constexpr Cause kEntriesMissing = {"entries-missing", Group::kWarning, Se
     "trust it."};
 inline constexpr Cause kEntriesNotCompared = {"entries-not-compared", Group::kWarning,
     Severity::kAlarm, ChainLink::kNone, "", "%s not compared with the manifest: unreadable, too "
-    "long, with a digest other than SHA-1 and SHA-256, or the time limit expired",
+    "long, without a SHA-1 or SHA-256 digest, or not reached before the time limit",
     "unzip -t names an unreadable entry. Run it again with a larger --timeout. Entries above 512 "
     "MiB are not compared."};
 inline constexpr Cause kWeakKey = {"weak-key", Group::kWarning, Severity::kWarning,
@@ -485,7 +485,7 @@ inline constexpr Cause kOtherPackageName = {"other-package-name", Group::kWarnin
     ChainLink::kNone, "", "phones install it as %s, but the tool reads another package name",
     "Build the package again with aapt or aapt2. If you did not build it, do not trust it."};
 inline constexpr Cause kNotLookedInto = {"not-looked-into", Group::kWarning, Severity::kAlarm,
-    ChainLink::kNone, "", "%s is too large and was not read, so this answer leaves it out",
+    ChainLink::kNone, "", "%s is too large and was not read, so this verdict does not consider it",
     "If you did not build this package, do not trust it: in real packages this part is small."};
 inline constexpr Cause kEntriesEncrypted = {"entries-encrypted", Group::kWarning, Severity::kDoubt,
     ChainLink::kNone, "", "%s: encrypted, and no phone decrypts it",

@@ -248,7 +248,7 @@ void ExpectRunsWithoutMemory(Installed& file, const std::string& all,
       before = outcome.grants.size();
     }
   }
-  FAIL() << "memory is asked for without end";
+  FAIL() << "the tool requests memory without end";
 }
 
 TEST(FailedAllocations, GiveAGoodPackageOnlyTheAllowedGrants) {

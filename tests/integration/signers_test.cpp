@@ -139,7 +139,7 @@ TEST(Signers, LeasedPackageIsReadAfterTheLeaseIsGivenUp) {
   const std::string apk = directory / "base.apk";
   fs::copy_file(Golden("apksigner-sha256-2048/base.apk"), apk);
   const Lease lease(apk);
-  if (!lease.IsHeld()) GTEST_SKIP() << "the file system of " << apk << " knows no leases";
+  if (!lease.IsHeld()) GTEST_SKIP() << "the file system of " << apk << " does not support leases";
   ExpectRun(DigestOfKey("apksigner-sha256-2048"), apk);
   EXPECT_TRUE(lease.WasGivenUp());
 }

@@ -6,7 +6,7 @@
 namespace {
 
 constexpr char kLaidOut[] =
-    "  its libraries were laid out beside it, as an installer does; --install=no turns this off";
+    "  its libraries were extracted beside it, as an installer does; --install=no turns this off";
 
 TEST_F(Reason, TamperedLibraryIsReported) {
   Take("apksigner-sha256-2048");
@@ -34,8 +34,8 @@ TEST_F(Reason, LibraryInASubdirectoryOfItsAbiIsReported) {
   MakePackage(WithLibraries({{"lib/arm64-v8a/sub/libx.so", ToBytes("x")}}))
       .WriteTo(directory_ / "base.apk");
   EXPECT_EQ(Told(5)[2],
-            "  – lib/arm64/sub/libx.so  nothing to sign: it is in a subdirectory of its ABI: the "
-            "tool looks for lib/arm64/sub/libx.so, and installers do not put it there");
+            "  – lib/arm64/sub/libx.so  nothing to sign: it is in a subdirectory of its ABI: "
+            "installers do not extract it to lib/arm64/sub/libx.so, where the tool looks");
 }
 
 // Phones install the libraries of one processor. Libraries of another processor do not count as
@@ -44,7 +44,7 @@ TEST_F(Reason, LibrariesOfAnotherProcessorAreNotLaidOut) {
   Take("apksigner-sha256-2048");
   Do("rm -r lib");
   const std::string other =
-      "nothing to sign: it is for another processor than the phone's (--install=all lays out "
+      "nothing to sign: it is for another processor than the phone's (--install=all extracts "
       "the libraries of all processors)";
   EXPECT_EQ(
       Told(6, {"--install", "--strict"}),
@@ -76,8 +76,8 @@ TEST_F(Reason, LibrariesMissingBesideThePackageAreReported) {
       Told(7),
       Lines({"SIGNED  base.apk" + ByRsa2048(), kSigned, "  – lib/arm64/libvault.so  " + absent,
              "  – lib/arm/libvault.so    " + absent,
-             "      If the phone has another processor, there is nothing to do. To lay out the",
-             "      libraries of all processors, give --install=all.",
+             "      If the phone has another processor, there is nothing to do. To extract the",
+             "      libraries of all processors, use --install=all.",
              "  ✓ key                    registered for com.example.vault", "-> 0"}));
   EXPECT_EQ(Told(1, {"--strict"}), Lines({"PARTLY SIGNED  base.apk", "-> 1"}));
   EXPECT_EQ(Told(5, {"--install=all"}),
@@ -107,7 +107,7 @@ TEST_F(Reason, PackageWithoutLibrariesBesideItIsLaidOut) {
     EXPECT_NE(installed.output.find("  – lib/arm64/libvault.so  nothing to sign: "),
               std::string::npos)
         << installed.output;
-    EXPECT_EQ(installed.output.find("laid out"), std::string::npos);
+    EXPECT_EQ(installed.output.find("extracted beside"), std::string::npos);
   }
   // With an empty directory lib, the package does not count as installed.
   Do("rm -rf lib; mkdir lib");
@@ -130,7 +130,7 @@ TEST_F(Reason, LibrariesKeptInsideThePackageAreReported) {
       "nothing to sign: it stays inside the package (extractNativeLibs=\"false\")";
   EXPECT_EQ(Told(6),
             Lines({"SIGNED  base.apk" + ByRsa2048(),
-                   "  ✓ package                 signed with the payload of that key",
+                   "  ✓ package                 signed with the payload of the signer's key",
                    "  – lib/arm64/libvault.so   " + kept, "  – lib/arm/libvault.so     " + kept,
                    "      Nothing to do: it is loaded from the package.",
                    "  – lib/x86_64/libvault.so  nothing to sign: the tool knows no directory "

@@ -71,9 +71,10 @@ TEST_F(ManyFiles, DirectoryWithoutRecursiveIsRefusedWithTheCure) {
       RunProcess({"env", "LC_ALL=C.UTF-8", SimulatorPath(), "--installer=off", "shop", "."},
                  directory_.path());
   EXPECT_EQ(run.status, 1);
-  EXPECT_NE(run.output.find("  ✗ file  not signed: it is a directory with 2 packages in it\n"
-                            "      Name them all, a base and its splits: DIRECTORY/*.apk; or give\n"
-                            "      --recursive.\n"),
+  EXPECT_NE(run.output.find(
+                "  ✗ file  not signed: it is a directory with 2 packages in it\n"
+                "      Name every package in it, the base and its splits: DIRECTORY/*.apk. Or\n"
+                "      give --recursive.\n"),
             std::string::npos)
       << run.output;
   EXPECT_NE(run.output.find("  ✗ file  not signed: it is a directory\n"

@@ -14,7 +14,8 @@
 
 using Lines = std::vector<std::string>;
 
-inline constexpr char kSigned[] = "  ✓ package                signed with the payload of that key";
+inline constexpr char kSigned[] =
+    "  ✓ package                signed with the payload of the signer's key";
 
 inline std::string ByRsa2048() {
   return "   com.example.vault   signer CN=rsa-2048, O=Example, RSA-2048, key 98302ce8…f64646";

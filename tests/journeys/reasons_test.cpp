@@ -38,7 +38,7 @@ TEST_F(Reason, JarsignerSignatureIsReported) {
     const Lines told = WithoutReason(3, FirstLines(kAll, {"base.apk"}, {{}, directory}));
     EXPECT_EQ(told, Lines({"REFUSED  base.apk",
                            "  ✗ package                not signed: its signature covers signed "
-                           "attributes, which jarsigner writes and this tool does not support",
+                           "attributes, which new jarsigner versions write and this tool refuses",
                            "      Sign it with apksigner; no option of jarsigner helps.", "-> 1"}));
   }
 }
@@ -113,7 +113,7 @@ TEST_F(Reason, CertificateSignedWithSha384IsReported) {
   const Lines told = Told(5);
   EXPECT_EQ(Lines(told.begin() + 1, told.end()),
             Lines({"  ✗ package                not signed: its certificate is signed with "
-                   "SHA384withRSA, and this tool reads MD5, SHA-1 and SHA-256 with RSA",
+                   "SHA384withRSA, not RSA PKCS#1 v1.5 with MD5, SHA-1 or SHA-256",
                    "      Certify the same key with SHA-256, and sign again: keytool -selfcert",
                    "      -alias ALIAS -sigalg SHA256withRSA -validity 10000 -keystore KEYSTORE.",
                    "      This makes another signer: phones refuse the package as an update of a",
@@ -125,8 +125,8 @@ TEST_F(Reason, CertificateSignedWithSha384IsReported) {
 TEST_F(Reason, SignatureOverSha512IsReported) {
   Take("openssl-cms-sha512");
   EXPECT_EQ(Told(2)[1],
-            "  ✗ package                not signed: it is signed over SHA512, and this tool reads "
-            "MD5, SHA-1 and SHA-256");
+            "  ✗ package                not signed: its signature uses SHA512, not RSA PKCS#1 "
+            "v1.5 with MD5, SHA-1 or SHA-256");
 }
 
 // No tool makes a signature block whose key has the public exponent 1. The test writes such a block
@@ -200,8 +200,8 @@ TEST_F(Reason, IntegrityValueOf0IsReported) {
              "at 0, so the tool may not sign",
              "  ✗ lib/arm/libvault.so    not signed: the tool's own integrity value settled "
              "at 0, so the tool may not sign",
-             "      The file was good. Look at the domain that the tool is started from: its",
-             "      value must be neither 0 nor ffffffff.",
+             "      The file was good. Check the domain that starts the tool: the tool's value",
+             "      must be neither 0 nor ffffffff.",
              "  ✓ key                    registered for com.example.vault", "  signer", "-> 1"}));
 }
 

@@ -128,9 +128,9 @@ TEST(SignerWarnings, EntryAddedAfterSigningGivesAWarning) {
 }
 
 TEST(SignerWarnings, StrippedSchemesGiveAWarning) {
-  EXPECT_EQ(LineWith(Told("added-entry"), "as well"),
-            "  ! the signature file says that the package is signed with v2, v3 as well, and it is "
-            "not: phones do not install it");
+  EXPECT_EQ(LineWith(Told("added-entry"), "also signed"),
+            "  ! the signature file says that the package is also signed with v2, v3, but it is "
+            "not: phones do not install the package");
 }
 
 }  // namespace

@@ -192,8 +192,8 @@ def main():
     if problems:
         print(f"FAILED: {len(all_runs)} runs on {len(kernels)} kernels", *problems, sep="\n")
         return 1
-    print(f"{len(all_runs)} runs on {len(kernels)} kernels: all results and payloads are the simulator's, "
-          f"and {kept} signed files keep theirs on the disk")
+    print(f"{len(all_runs)} runs on {len(kernels)} kernels: all results and payloads equal the "
+          f"simulator's, and {kept} signed files keep their payloads on the disk")
     return 0
 
 

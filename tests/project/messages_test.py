@@ -58,7 +58,7 @@ CAUSE = re.compile(r"inline constexpr Cause (?P<name>k\w+) = \{\s*(?P<code>%s),\
 
 # The groups in order, each with the title of its table.
 GROUPS = {"kNotLookedAt": "The tool did not look at the file",
-          "kSimulation": "The simulation could not tell", "kFile": "What the file is",
+          "kSimulation": "The simulation has no result", "kFile": "What the file is",
           "kSignature": "A package's signature", "kKernel": "The kernel", "kLibrary": "A library",
           "kKey": "The key", "kTool": "The tool itself",
           "kInstaller": "The installer of the phones",

@@ -49,7 +49,8 @@ TEST(Main, FifoIsRefusedWithoutWaiting) {
 TEST(Main, LeasedFileIsProcessedAfterTheLeaseIsGivenUp) {
   const DiskFile file(MakePackage(WithLibraries({})).Build());
   const Lease lease(file.path());
-  if (!lease.IsHeld()) GTEST_SKIP() << "the file system of " << file.path() << " knows no leases";
+  if (!lease.IsHeld())
+    GTEST_SKIP() << "the file system of " << file.path() << " does not support leases";
   const ProcessResult run = RunTool("timeout 20 \"$0\" \"$1\" </dev/null", file.path());
   EXPECT_EQ(run.status, 0);
   EXPECT_TRUE(lease.WasGivenUp());

@@ -45,7 +45,7 @@ TEST(ExitStatus, IsFourForAMissingFile) {
   EXPECT_EQ(result.output,
             "NOT LOOKED AT  /nowhere/base.apk   there is no such file\n"
             "  ✗ file  not looked at: there is no such file\n"
-            "      Check the name; a relative one counts from the directory in which the tool\n"
+            "      Check the name. A relative name starts at the directory in which the tool\n"
             "      is run.\n"
             "   1  exit       status 0\n");
 }
@@ -156,7 +156,8 @@ TEST(ExitStatus, IsThreeWhenRunnerIsMissingOrStandInsAreNotLoaded) {
   const ProcessResult runner =
       RunProcess({SimulatorPath(), "--runner", "true", "--tool", tool, "/"});
   EXPECT_EQ(runner.status, 3);
-  EXPECT_EQ(runner.errors, "apktoolkit-sim: /: the stand-ins were not loaded into " + tool + "\n");
+  EXPECT_EQ(runner.errors,
+            "apktoolkit-sim: /: the simulator's libraries were not loaded into " + tool + "\n");
 }
 
 TEST(ExitStatus, IsThreeWhenTheJournalCannotBeWritten) {
@@ -216,10 +217,10 @@ TEST(ExitStatus, IsThreeWhenLibrariesCannotBeWritten) {
       RunProcess({"bash", "-c", "trap '' XFSZ; ulimit -f 1; exec \"$@\"", "bash", "env",
                   "LC_ALL=C.UTF-8", SimulatorPath(), "--quiet", "--install", file});
   EXPECT_EQ(result.status, 3) << result.output;
-  EXPECT_EQ(
-      result.output.rfind("NOT SIMULATED  " + file + "   its libraries cannot be laid out: ", 0),
-      0U);
-  EXPECT_NE(result.errors.find("its libraries cannot be laid out: "), std::string::npos);
+  EXPECT_EQ(result.output.rfind(
+                "NOT SIMULATED  " + file + "   its libraries cannot be extracted beside it: ", 0),
+            0U);
+  EXPECT_NE(result.errors.find("its libraries cannot be extracted beside it: "), std::string::npos);
   EXPECT_NE(result.errors.find(" <install>/lib/arm64/liba.so: File too large"), std::string::npos);
 }
 

@@ -300,7 +300,7 @@ TEST_F(OpenForReadingTest, FifoIsOpenedWithoutWaiting) {
 TEST_F(OpenForReadingTest, LeasedFileIsOpenedOnceItsHolderGivesItUp) {
   const std::string path = MakeFile("abc");
   const Lease lease(path);
-  if (!lease.IsHeld()) GTEST_SKIP() << "the file system of " << path << " knows no leases";
+  if (!lease.IsHeld()) GTEST_SKIP() << "the file system of " << path << " does not support leases";
   ASSERT_EQ(-1, open(path.c_str(), O_RDONLY | O_NONBLOCK | O_CLOEXEC));
   ASSERT_EQ(EWOULDBLOCK, errno);
   const int fd = OpenForReading(path.c_str(), O_CLOEXEC);
@@ -317,7 +317,8 @@ TEST_F(ReadFileTest, LeasedFileIsReadOnceItsHolderGivesItUp) {
   const std::string path = MakeFile("abc");
   {
     const Lease lease(path);
-    if (!lease.IsHeld()) GTEST_SKIP() << "the file system of " << path << " knows no leases";
+    if (!lease.IsHeld())
+      GTEST_SKIP() << "the file system of " << path << " does not support leases";
     Bytes out;
     EXPECT_TRUE(ReadFile(path, out));
     EXPECT_EQ(ToBytes("abc"), out);

@@ -75,8 +75,8 @@ TEST(Page, ShowsVerdictItemsWarningsAndSigner) {
         ">✓</span> <span class=\"name\">lib/arm/a.so</span> <span class=\"outcome\">signed</span>",
         ">✗</span> <span class=\"name\">lib/arm/b.so</span> <span class=\"outcome\">not signed: "
         "its bytes are not those that the manifest lists</span>",
-        "</span> the signature file says that the package is signed with v2 as well, and it is "
-        "not: phones do not install it</p>",
+        "</span> the signature file says that the package is also signed with v2, but it is not: "
+        "phones do not install the package</p>",
         "<p class=\"cure\">Sign the package again, as the last step that changes it.</p>",
         "<dt>key size (bits)</dt><dd>2048</dd>"}) {
     EXPECT_TRUE(Has(page, part)) << part << "\n" << page;
@@ -401,7 +401,7 @@ TEST(Page, KeepsOptionsOnOneLine) {
   report.items[0].state = ItemState::kAbsent;
   EXPECT_TRUE(Has(PageOf(report),
                   "<p class=\"cure\">If the phone has another processor, there is nothing to "
-                  "do. To lay out the libraries of all processors, give <span "
+                  "do. To extract the libraries of all processors, use <span "
                   "class=\"option\">--install=all</span>.</p>"));
   EXPECT_TRUE(Has(PageOf(report), ".option { white-space: nowrap; }"));
 }

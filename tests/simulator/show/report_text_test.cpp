@@ -65,7 +65,7 @@ TEST(ReportText, HasTheVerdictTheItemsAndWhatToDo) {
       Printed(Example()),
       "PARTLY SIGNED  base.apk   lib/arm64/libvault.so: its bytes are not those that the manifest "
       "lists\n"
-      "  ✓ package                 signed with the payload of that key\n"
+      "  ✓ package                 signed with the payload of the signer's key\n"
       "  ✓ lib/arm/libvault.so     signed\n"
       "  ✗ lib/arm64/libvault.so   not signed: its bytes are not those that the manifest "
       "lists\n"
@@ -145,8 +145,8 @@ TEST(ReportText, WarningsAreYellowAndSayWhatToDo) {
   EXPECT_EQ(
       Printed(report, {true, true}),
       "\x1b[33mPARTLY SIGNED\x1b[0m  base.apk   com.example.vault   1 warning\n"
-      "\x1b[33m  ! the signature file says that the package is signed with v2 as well, and it "
-      "is not: phones do not install it\x1b[0m\n"
+      "\x1b[33m  ! the signature file says that the package is also signed with v2, but it is "
+      "not: phones do not install the package\x1b[0m\n"
       "      Sign the package again, as the last step that changes it.\n");
 }
 
@@ -175,14 +175,15 @@ TEST(ReportText, NamesWidenTheColumnUpTo40Characters) {
   EXPECT_EQ(column(longest + "l"), 4U + 40 + 2);
 }
 
-// Neighbouring items with the same cure print it once.
+// Neighbouring items with the same cure print it once. The lines are the verdict, the three items,
+// and the two lines of the cure.
 TEST(ReportText, NeighboursWithTheSameCausePrintOneCure) {
   Report report = Example();
   report.items = {
       {ItemKind::kLibrary, "a", "", ItemState::kAbsent, {&cause::kLibraryMissing, ""}},
       {ItemKind::kLibrary, "b", "", ItemState::kAbsent, {&cause::kLibraryMissing, ""}},
       {ItemKind::kLibrary, "c", "", ItemState::kRefused, {&cause::kPackageRefused, ""}}};
-  EXPECT_EQ(LinesOf(Printed(report)).size(), 5U);
+  EXPECT_EQ(LinesOf(Printed(report)).size(), 6U);
 }
 
 TEST(ReportText, HostileCharactersAreNotPrinted) {

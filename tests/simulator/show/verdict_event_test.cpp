@@ -92,7 +92,7 @@ TEST(VerdictEvent, HoldsTheWholeReport) {
       {"kind": "library", "name": "lib/arm/a.so", "entry": "lib/armeabi/a.so", "state": "absent",
        "reason": "library-missing",
        "text": "it is not beside the package, but other libraries are",
-       "cure": "Install the package again, unless the installer leaves it out on purpose."},
+       "cure": "Install the package again, unless the installer leaves this library out on purpose."},
       {"kind": "library", "name": "lib/x86/a.so", "entry": "lib/x86/a.so",
        "state": "nothing-to-sign", "reason": "library-other-abi",
        "text": "the tool knows no directory for its ABI",
