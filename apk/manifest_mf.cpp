@@ -57,9 +57,9 @@ class Parser {
     P_EOL,           // at a line break; the kind of the next line is unknown
   };
 
-  // Deliberate: no step sets any other state, so no test can reach this message. The guard is kept
-  // for a state that is added later without a case in step(). With the guard, a manifest that
-  // reaches that state is refused.
+  // Deliberate: each step sets one of the states above, so no test can reach the message below.
+  // This check is kept for a state that is added later without a case in step(). A manifest that
+  // reaches such a state is then refused.
   bool isExpectedState() const {
     const bool is_expected = state_ <= P_EOL;
     if (!is_expected) LogError("Parse manifest: Unexpected state.\n");
@@ -114,10 +114,10 @@ class Parser {
   }
 
   // Deliberate: if a line break follows the colon directly, the cursor always moves to the second
-  // byte after the colon. After CR LF, that byte is the LF. After a lone CR or LF, it is the first
-  // byte of the next line, and then counts as the line break. A name on the next line loses its
-  // first byte, and an empty line or a continuation line is not recognised. Signing tools write CR
-  // LF. For other files, the result must not change.
+  // byte after the colon. If the line break is CR LF, that byte is the LF. If it is a lone CR or
+  // LF, that byte is the first byte of the next line, and then counts as the line break. A name on
+  // the next line loses its first byte. An empty line, or a continuation line with one space, is
+  // not recognised. Signing tools write CR LF. For other files, the result must not change.
   bool passColon() {
     const char next = byteAt(cursor_ + 1);
     if (next != ' ' && !IsLineBreak(next)) {

@@ -1,8 +1,9 @@
 // RSA PKCS#1 v1.5 signature verification (RFC 8017 §8.2.2) with the integers of crypto/mpi.h.
 //
 // A context owns the limbs of its two numbers; an rsa_local releases them. No pointer to the
-// caller's bytes is kept after a call. A refused DigestInfo is logged at error priority, unless it
-// has the length of an MD5 DigestInfo and another prefix. No other refusal is logged.
+// caller's bytes is kept after a call. A refused DigestInfo is logged at error priority. Only a
+// DigestInfo that is as long as one for MD5, but has a wrong prefix, is refused without a message.
+// No other refusal is logged.
 #pragma once
 
 #include <cstdint>
@@ -56,8 +57,9 @@ int rsa_set_key(rsa_context* ctx, const uint8_t* modulus, const uint8_t* exponen
                 uint32_t exponent_value, uint32_t len);
 
 // Checks the signature `sig` against the digests of the signed data. `sig` is big-endian and has
-// the context's `len` bytes. The signature itself names its digest algorithm. `sha1` (20 bytes) and
-// `md5` (16 bytes) must not be null. If `sha256` (32 bytes) is null, no SHA-256 signature verifies.
+// the context's `len` bytes. The signature itself names its digest algorithm. `sha1` has 20 bytes.
+// `md5` has 16 bytes and must not be null; this is not checked. If `sha256` (32 bytes) is null, no
+// SHA-256 signature verifies.
 //
 // Returns 0 if the signature contains the right digest, and otherwise
 //   kRsaBadInput (5)        null `ctx`, `sha1` or `sig`; `len` outside 16..512; signature not below

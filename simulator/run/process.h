@@ -9,8 +9,9 @@ namespace simulator {
 
 // Reserves the descriptors of closed standard streams, so that no file of this program gets one.
 // Returns true if there was a standard input. Programs that this process starts find the streams as
-// they were. Afterwards only std::cout writes to standard output: other output of the tool's own
-// code in this process is discarded. Call it before anything is printed.
+// they were. This program also contains code of the tool. Afterwards only std::cout writes to
+// standard output, and the lines that the tool's code prints in this process are discarded. Call it
+// before anything is printed.
 bool KeepStandardStreams();
 
 // After this call, SIGINT, SIGTERM, SIGHUP, SIGQUIT and SIGPIPE do not end the process before it

@@ -38,9 +38,9 @@ void Sarif::Add(const Report& report) {
   const size_t index = AddArtifact(report);
   const Json location = {{"physicalLocation",
                           {{"artifactLocation", {{"uri", UriOf(report.file)}, {"index", index}}}}}};
-  // A refusal that follows from another refusal has no result, because the result of that other
-  // refusal says what to fix. If all refusals of the report follow from others, they have results,
-  // so that a refused file always has one.
+  // A refusal that follows from another refusal gets no result, because the result of that other
+  // refusal says what to fix. If the report has only refusals that follow from others, each of them
+  // gets a result, so that every refused file has at least one.
   const bool has_origin =
       std::any_of(report.items.begin(), report.items.end(),
                   [](const Item& item) { return IsRefused(item) && !Follows(item); });

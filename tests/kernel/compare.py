@@ -4,11 +4,12 @@ in the simulated phone, and prints a table.
 
 The directory FILES has the files of the runs, and the directory EXPECTED has the simulator's
 journals. Each directory KERNEL has `results`, which tests/kernel/init wrote, and `disk.img`. Fails
-if anything differs: an event (log record, reading of the integrity value, call to the kernel with
-payload, result and errno, registration, exit status), its place in the order, a line of output, or
-a result of the probe (tests/simulator/phone/probe.cpp). Also fails if a signed file on the disk
-does not keep its payload and its digest, or if the kernel complained. With an SELinux policy, also
-fails if the tool's domain was not entered once per run that the policy confines."""
+if anything differs: an event, its place in the order, a line of output, or a result of the probe
+(tests/simulator/phone/probe.cpp). An event is a log record, a reading of the integrity value, a
+call to the kernel (with its payload, result and errno), a registration, or an exit status. Also
+fails if a signed file on the disk does not keep its payload and its digest, or if the kernel
+complained. With an SELinux policy, also fails if the tool's domain was not entered once per run
+that the policy confines."""
 
 import difflib
 import hashlib

@@ -1,7 +1,7 @@
 #!/usr/bin/env python3
-"""Runs the keytool commands that README.md, docs/guide.md and the manual page show. The certificate
-that each command makes must be signed with SHA-256. The pages also name the default algorithms of
-some JDKs. If the installed JDK is one of these JDKs, it must use these algorithms."""
+"""Runs each command keytool -genkeypair that README.md, docs/guide.md and the manual page show. The
+certificate that each command makes must be signed with SHA-256. The pages also name the default
+algorithms of some JDKs. If the installed JDK is one of these JDKs, it must use these algorithms."""
 
 import re
 import subprocess
@@ -41,8 +41,9 @@ def page_problems():
         if not commands:
             problems.append(f"{page} shows no command that makes a key")
         for command in commands:
-            # keytool asks for the values of these two options if they are missing. Each option may
-            # be given only once.
+            # keytool asks for the values of these two options if they are missing, so
+            # signature_algorithm() adds them. The page's own values are removed, because keytool
+            # warns about an option that is given twice.
             command = re.sub(r" -(dname|storepass) \S+| 2>.*", "", command)
             if (found := signature_algorithm(command)) != "sha256WithRSAEncryption":
                 problems.append(f"{page}: the certificate of {command} is signed with {found}")

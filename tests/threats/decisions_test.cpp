@@ -1,6 +1,6 @@
 // Tests the two refusals that no package of a signing tool causes: the refusal of an exponent of 1,
-// and the refusal of a library that has changed since it was read. The packages are made by aapt
-// and apksigner.
+// and the refusal of a library that has changed since it was read. Each test starts from a package
+// that aapt and apksigner made, and then forges its signature block or replaces a library.
 #include <sys/stat.h>
 
 #include <algorithm>

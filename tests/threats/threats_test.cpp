@@ -73,9 +73,10 @@ TEST(Threat, FirstCertificateAndFirstSignatureOfTwoSignersCount) {
   }
 }
 
-// Four bytes follow the modulus. The exponent's fifth to eighth bytes, 00 01 00 00, are 256 in host
-// byte order. They set the length of the modulus back to 256 bytes. Other readers see a key of 2080
-// bits.
+// The certificate's modulus is the signer's modulus with four more bytes. The tool writes the fifth
+// to eighth bytes of the exponent over the modulus length (crypto/pkcs7.h). Here these bytes are 00
+// 01 00 00, which is 256 in host byte order, so the tool ignores the four bytes. Other readers see
+// a key of 2080 bits.
 TEST(Threat, ModulusWithExtraBytesIsTheKeyThatItStartsWith) {
   Package package = MakePackage();
   Certificate certificate;
