@@ -33,10 +33,10 @@ uint16_t FirstUnit(Text text);
 }  // namespace
 
 bool Apk::ParseAndroidManifest(std::vector<uint8_t> bytes) {
-  // The platform's parser does not check that a whole header or attribute is there before it reads
-  // one. The buffer is therefore longer than the document, by the size of an attribute, which is
-  // larger than a header. A document that is shorter than a header is passed with size 0, which the
-  // parser refuses.
+  // The platform's parser does not check that a whole chunk header or attribute is there before it
+  // reads one. The buffer is therefore longer than the document, by the size of an attribute, which
+  // is larger than a chunk header. A document that is shorter than a chunk header is passed with
+  // size 0, which the parser refuses.
   const size_t size = bytes.size(), room = size + sizeof(android::ResXMLTree_attribute);
   bytes.reserve(room);
   bytes.resize(room);
@@ -72,10 +72,10 @@ bool Apk::ParseAndroidManifest(std::vector<uint8_t> bytes) {
 
 namespace {
 
-// Returns the element's attribute "package" in UTF-8. The result is empty if the element does not
-// have the attribute, or if its text has only unpaired surrogates. `nameless` has the address of
-// each text that was converted before. Such a text gave an empty name, so it is not converted
-// again.
+// Returns the element's attribute "package" in UTF-8. The result is empty if no such attribute has
+// a text, or if the text has only unpaired surrogates. `nameless` has the address of each text that
+// was converted before. This function is called only until a name is found, so these texts gave an
+// empty name. They are not converted again.
 String8 ReadPackageName(const ResXMLParser& parser, std::set<const char16_t*>* nameless) {
   const Text name = getStrAttr(parser, "package");
   if (name.empty() || !nameless->insert(name.data()).second) return String8();
@@ -120,7 +120,7 @@ Text getStrAttr(const ResXMLParser& parser, std::string_view name) {
   return {};
 }
 
-// True if the platform would convert `text` to the UTF-8 text `wanted`. The conversion drops
+// True if the platform would convert `text` to `wanted`, an ASCII text. The conversion drops
 // unpaired surrogates. Deliberate: a text with more than kMostSurrogates of them does not match, so
 // that no comparison reads a long text.
 bool Equals(Text text, std::string_view wanted) {

@@ -27,7 +27,7 @@ std::string SignatureBlockName(const std::string& signature_file_name);
 
 class Apk {
  public:
-  // The name of the manifest's entry, read at each use.
+  // The name of the manifest's entry. A program may set this pointer to another name.
   static const char* kMANIFEST_MF;
 
   // Like Init(fd, nullptr) on an empty object.
@@ -35,8 +35,8 @@ class Apk {
   Apk(const Apk&) = delete;
   Apk& operator=(const Apk&) = delete;
 
-  // Opens the file as a zip archive. An archive that contains "AndroidManifest.xml" is a package:
-  // Init then verifies its JAR signature and reads its manifests.
+  // Opens the file as a zip archive. If its entry "AndroidManifest.xml" can be extracted, the
+  // archive is a package: Init then verifies its JAR signature and reads its manifests.
   //
   // `fd`: the file, open for reading. The caller keeps it open for the life of the object and
   // closes it. If `fd` is -1, Init opens `path` itself. Release() closes that descriptor if the
@@ -72,9 +72,9 @@ class Apk {
 
   // Iterate over the entries of the archive, which must be open. Results are the zip library's
   // codes (0: success). StartIteration stores a cookie for the entries whose names begin with
-  // `prefix` and end with `suffix`. An empty text matches every name. Each call of Next stores the
-  // next entry, in the library's order. Next returns -1 after the last entry, and changes `name`
-  // only if the result is 0. EndIteration releases the cookie.
+  // `prefix` and end with `suffix`. An empty `prefix` or `suffix` excludes no name. Each call of
+  // Next stores the next entry, in the library's order. Next returns -1 after the last entry, and
+  // changes `name` only if the result is 0. EndIteration releases the cookie.
   int32_t StartIteration(void** cookie, const std::string& prefix, const std::string& suffix) {
     return StartZipIteration(zip_handle_, cookie, prefix, suffix);
   }

@@ -23,8 +23,8 @@ int base64decode(const char* in, size_t length, uint8_t* out, size_t* out_length
   uint32_t accumulator = 0;
   int collected = 0;  // number of 6-bit values in the accumulator
   // Writes the whole bytes of the accumulator. Returns false if they do not fit. Deliberate:
-  // leftover bits are dropped without an error. A single value has no whole byte, and is also
-  // dropped.
+  // leftover bits are dropped without an error. A single 6-bit value is less than a byte, and is
+  // also dropped.
   const auto flush = [&] {
     const size_t count = collected < 2 ? 0 : static_cast<size_t>(collected) - 1;
     if (*out_length - written < count) return false;

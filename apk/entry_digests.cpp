@@ -13,9 +13,9 @@ ManifestMf::Section::value_type DigestOf(const ManifestMf::Section& section) {
   return section.findLastEndingIn("-Digest");
 }
 
-// std::hash is not used. In older releases of the C++ library, its unsigned arithmetic wraps and is
-// not marked as intended. A tool that is built with the sanitizer for unsigned overflow would stop
-// there.
+// std::hash is not used. In older releases of the C++ library, the unsigned arithmetic of std::hash
+// wraps and is not marked as intended. A tool that is built with the sanitizer for unsigned
+// overflow would stop there.
 size_t Hash(std::string_view name) {
   size_t hash = 0;
   for (const char c : name) hash = (hash << 9 | hash >> 55) ^ static_cast<uint8_t>(c);

@@ -10,7 +10,8 @@
 
 namespace ApkTools {
 
-// The zip library's codes for the refusals below. The library's header has no names for them.
+// The zip library's codes for the refusals of ExtractZipEntry. The library's header has no names
+// for them.
 inline constexpr int32_t kZipInconsistentInformation = -9;
 inline constexpr int32_t kZipAllocationFailed = -13;
 
@@ -25,9 +26,9 @@ bool IsPlausibleLength(const ZipEntry& entry);
 
 // Extracts the whole entry into `out`, which then has the entry's length. If the declared length is
 // impossible, returns kZipInconsistentInformation and leaves `out` unchanged. If the entry is
-// longer than kZipTrustedLength, `out` also stays unchanged in two cases: the data has another
-// length (returns the library's code), or the entry does not fit in memory (returns
-// kZipAllocationFailed).
+// longer than kZipTrustedLength, `out` also stays unchanged in two cases: the first reading of the
+// data fails, for example because of its length (returns the library's code), or the entry does not
+// fit in memory (returns kZipAllocationFailed).
 int32_t ExtractZipEntry(ZipArchiveHandle archive, ZipEntry* entry, std::vector<uint8_t>& out);
 
 }  // namespace ApkTools

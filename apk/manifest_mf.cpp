@@ -58,8 +58,8 @@ class Parser {
   };
 
   // Deliberate: each step sets one of the states above, so no test can reach the message below.
-  // This check is kept for a state that is added later without a case in step(). A manifest that
-  // reaches such a state is then refused.
+  // This check is kept for a state that is added later, after P_EOL, without a case in step(). A
+  // manifest that reaches such a state is then refused.
   bool isExpectedState() const {
     const bool is_expected = state_ <= P_EOL;
     if (!is_expected) LogError("Parse manifest: Unexpected state.\n");
@@ -95,7 +95,8 @@ class Parser {
   }
 
   // Deliberate: a line break does not end a name. A line without a colon becomes the front part of
-  // the next line's name. No code looks for such a name.
+  // the next line's name. Such a name equals no name that the tool looks for. If it ends like the
+  // name of a digest, the digest counts as unsupported.
   bool readName() {
     storePair();
     size_t end = cursor_;
@@ -130,7 +131,7 @@ class Parser {
     return true;
   }
 
-  // Moves the continuation line to the end of the value. This may overwrite the bytes between the
+  // Moves the continuation line to the end of the value. This can overwrite the bytes between the
   // value and the line, which are never read again.
   void continueValue() {
     const ManifestPiece line = readLine();
@@ -179,7 +180,7 @@ class Parser {
     }
   }
 
-  // Adds the pending pair to the section if it has a name and a value. Nothing is pending
+  // Adds the pending pair to the section if the pair has a name and a value. Nothing is pending
   // afterwards.
   void storePair() {
     if (pending_.name.length != 0 && pending_.value.length != 0) sections_.add(pending_);

@@ -1,6 +1,6 @@
 // Parses the text of a JAR manifest or signature file (JAR File Specification, "JAR Manifest" and
-// "Signed JAR File") into sections of attributes. The object owns the text; everything it returns
-// points into that text. A text that does not parse is logged as an error, once per load().
+// "Signed JAR File") into sections of attributes. The object owns the text; the names and values of
+// the attributes point into it. A syntax error in the text is logged, once per load().
 #pragma once
 
 #include <cstdint>

@@ -56,10 +56,10 @@ void ManifestSections::reset(const uint8_t* text, size_t size) {
   patience_ = kLittleText;
 }
 
-// From time to time, sorts the open section, which drops repeated names. Otherwise repeated names
-// could fill the table. Each sort compares all names of the section, so the next sort waits for
-// more text: kLittleText bytes, and for each name its length and kTwoAttributes bytes.
-// kTwoAttributes is the length of two short attributes, such as "A: b", with their line ends.
+// From time to time, sorts the open section. The sort drops repeated names, which could otherwise
+// fill the table. Each sort compares all names of the section, so the next sort waits for more
+// text: kLittleText bytes, and for each name its length and kTwoAttributes bytes. kTwoAttributes is
+// the length of two short attributes, such as "A: b", with their line ends.
 void ManifestSections::add(const ManifestAttribute& attribute) {
   constexpr size_t kTwoAttributes = 10;
   attributes_.push_back(attribute);

@@ -67,7 +67,7 @@ bool Apk::VerifyCertificate(std::vector<uint8_t>& block, std::vector<uint8_t>& s
                             std::vector<uint8_t>& key) {
   pkcs7 record = {};
   if (processCert(block.data(), static_cast<uint32_t>(block.size()), &record) != 0) {
-    // Deliberate: the text has no line end. Programs that parse the log match on it.
+    // Deliberate: the text has no line end. Programs that parse the log match on this text.
     LogError("Unknown certificate type");
     return false;
   }
@@ -91,8 +91,8 @@ bool Apk::VerifyCertificate(std::vector<uint8_t>& block, std::vector<uint8_t>& s
     LogError("RSA could not verify data: %X\n", static_cast<unsigned>(result));
     return false;
   }
-  // Deliberate: longer keys never verify above, so no test reaches this line. The guard limits the
-  // key's length even if the limit of rsa_pkcs1_verify is raised later.
+  // Deliberate: a key longer than kLongestKey never verifies above, so no test reaches this line.
+  // The guard limits the key's length even if the limit of rsa_pkcs1_verify is raised later.
   if (record.modulus_length > kLongestKey) return false;
   key.assign(record.modulus, record.modulus + record.modulus_length);
   return true;
@@ -120,9 +120,9 @@ bool Apk::ValidateManifest(const std::vector<uint8_t>& manifest) {
 
 bool Apk::VerifyData(const std::string& digest_name, const std::vector<uint8_t>& expected,
                      const std::vector<uint8_t>& data) {
-  // Deliberate: only these two digests are supported. apksigner writes one of them into every
-  // manifest. Other digests (MD5, SHA-512) are refused. The rule for signatures is different: old
-  // packages have signatures over MD5 digests, and these signatures verify.
+  // Deliberate: only SHA-1 and SHA-256 digests are supported. apksigner writes one of the two into
+  // every manifest. Other digests (MD5, SHA-512) are refused. The rule for signatures is different:
+  // old packages have signatures over MD5 digests, and these signatures verify.
   std::vector<uint8_t> computed;
   if (digest_name == "SHA1-Digest") {
     ComputeSHA1Digest(data, computed);
@@ -148,9 +148,9 @@ bool FitsInBlock(const std::vector<uint8_t>& block, const uint8_t* start, size_t
 // extends beyond the block or its exponent is 1 or -1.
 int LoadKey(const std::vector<uint8_t>& block, const pkcs7& record, rsa_context& key) {
   if (!FitsInBlock(block, record.modulus, record.modulus_length)) return kRsaBadInput;
-  // Deliberate: the four bytes are read in host byte order, although certificates store the high
-  // byte first. The result is right for an exponent of one byte and for 65537. Signing tools use no
-  // other exponents.
+  // Deliberate: the exponent's four bytes are read in host byte order, although certificates store
+  // the high byte first. The result is right for an exponent of one byte and for 65537. Signing
+  // tools use no other exponents.
   uint32_t exponent;
   memcpy(&exponent, record.exponent, sizeof(exponent));
   if (rsa_is_forgeable(exponent)) return kRsaBadInput;

@@ -2,8 +2,9 @@
 // releases.
 //
 // The library has two generations. Its functions accept names as `ZipString` up to API 29, and as
-// std::string_view later. Only this file depends on the difference. The library owns archives,
-// entries and cookies. All results are the library's codes (0: success). Nothing is logged.
+// std::string_view later. In the tool, only this file depends on the difference. The library owns
+// archives, entries and cookies. Each int32_t result is one of the library's codes (0: success).
+// Nothing is logged.
 #pragma once
 
 #include <ziparchive/zip_archive.h>
@@ -66,7 +67,7 @@ inline int32_t FindZipEntry(ZipArchiveHandle archive, const std::string& text, Z
 }
 
 // Starts an iteration over the entries whose names begin with `prefix` and end with `suffix`. An
-// empty text matches every name.
+// empty `prefix` or `suffix` excludes no name.
 inline int32_t StartZipIteration(ZipArchiveHandle archive, void** cookie, const std::string& prefix,
                                  const std::string& suffix) {
   if (prefix.size() > kZipLongestName || suffix.size() > kZipLongestName) {

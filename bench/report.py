@@ -1,6 +1,7 @@
-"""bench/report.py BUILD-DIRECTORY: measures the tool and two programs that do the same job: the
-floor (bench_floor) without the verification, and the peer (bench_peer) with OpenSSL. Prints the
-tables, and writes the numbers and plots of docs/performance.md. scripts/bench calls this script."""
+"""bench/report.py BUILD-DIRECTORY: measures the tool and two programs for comparison. The floor
+(bench_floor) does the tool's job without the verification. The peer (bench_peer) does the
+tool's job with OpenSSL. Prints tables of the results, and writes them and the plots to
+docs/performance.md. scripts/bench calls this script."""
 
 import collections
 import datetime

@@ -79,8 +79,8 @@ constexpr Text kTexts[] = {
     {"one name without end", [] { return Repeat([](size_t) { return "A"; }); }},
 };
 
-// With these numbers, documents deflate to a thousandth of their size, so that a small package can
-// contain them.
+// A document has kManyNodes nodes, and its one long text has kLongName characters. Such a document
+// deflates to a thousandth of its size, so a small package can contain it.
 constexpr size_t kManyNodes = 1 << 20;
 constexpr size_t kLongName = 30000;
 

@@ -17,8 +17,8 @@ set(APKTOOLKIT_TOOL_OPTIONS -fno-exceptions -fno-rtti -Wconversion)
 # The hardening that the platform uses for its own programs. Symbols are bound before the program
 # starts, and their table is then read-only. Programs can be loaded at any address. The stack is
 # protected. Calls of C library functions are checked where the compiler knows the size of the
-# buffer. On 64-bit Arm, jumps and returns are protected, too. scripts/check-binary checks all of
-# this in the compiled files.
+# buffer. On 64-bit Arm, jumps and returns are protected, too. scripts/check-binary checks this in
+# the compiled files. It checks jumps and returns only in object files and static libraries.
 option(APKTOOLKIT_HARDEN "Harden programs and libraries as the platform does" ON)
 if(APKTOOLKIT_HARDEN)
   include(CheckPIESupported)

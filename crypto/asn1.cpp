@@ -38,7 +38,8 @@ int asn1_get_next_bounded(const uint8_t* buf, size_t available, size_t bound, as
   if (!ReadIdentifier(&octets, hdr) || !ReadLength(&octets, hdr)) return -1;
 
   const size_t header_length = readable - octets.left;
-  // Deliberate: the remaining length is cut to 32 bits, because the header's length has 32 bits.
+  // Deliberate: the remaining length is cut to 32 bits, because the field `length` of asn1_hdr has
+  // 32 bits.
   const auto remaining = static_cast<uint32_t>(bound - header_length);
   if (hdr->length > remaining) return -1;
   hdr->payload = octets.position;
@@ -57,7 +58,7 @@ int asn1_parse_oid(const uint8_t* buf, size_t len, asn1_oid* oid) {
       oid->oid[oid->len++] = static_cast<uint32_t>(first);
       value -= first * 40;
     }
-    // Deliberate: an arc that does not fit in the record loses its high bits.
+    // Deliberate: an arc of more than 32 bits keeps only its low 32 bits.
     oid->oid[oid->len++] = static_cast<uint32_t>(value);
   }
   return 0;
@@ -88,7 +89,7 @@ void asn1_oid_to_str(const asn1_oid* oid, char* buf, size_t size) {
 
 // Deliberate: the count of unused bits is ignored, so the unused bits are read like all others.
 uint64_t asn1_bit_string_to_long(const uint8_t* buf, size_t len) {
-  constexpr size_t kMaxOctets = 5;  // the count of unused bits, and 32 bits
+  constexpr size_t kMaxOctets = 5;  // 1 for the count of unused bits, and 4 for 32 bits
   uint64_t value = 0;
   for (size_t i = 1; i < std::min(len, kMaxOctets); ++i) {
     for (size_t bit = 0; bit < 8; ++bit) {

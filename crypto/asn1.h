@@ -1,7 +1,7 @@
 // Reads DER one header at a time (X.690 §8.1). Accepts some encodings that only BER allows. The
-// caller interprets the values. The functions neither allocate nor log. Records point into the
-// caller's bytes. These bytes must outlive the records. Every function that can fail returns 0 for
-// success and -1 for failure.
+// caller interprets the values. The functions neither allocate nor log. An asn1_hdr points into the
+// caller's bytes, which must outlive it. Every function that can fail returns 0 for success and -1
+// for failure.
 #pragma once
 
 #include <cstddef>
@@ -60,9 +60,9 @@ int asn1_get_next_bounded(const uint8_t* buf, size_t available, size_t bound, as
 // an arc, and for a 21st arc. `oid` then contains the arcs before the fault.
 int asn1_parse_oid(const uint8_t* buf, size_t len, asn1_oid* oid);
 
-// Reads a whole OBJECT IDENTIFIER element from the `len` bytes at `buf`. If the header is correct,
-// sets `next` to the position after the element, even if the contents are malformed. Fails for any
-// other element, and for empty contents.
+// Reads a whole OBJECT IDENTIFIER element from the `len` bytes at `buf`. Sets `next` to the
+// position after the element, even if the read then fails because the contents are malformed. Also
+// fails for any other element and for empty contents, and then leaves `oid` and `next` unchanged.
 int asn1_get_oid(const uint8_t* buf, size_t len, asn1_oid* oid, const uint8_t** next);
 
 // Writes the arcs as dotted text into the `size` bytes at `buf`. The text is cut to fit and ends

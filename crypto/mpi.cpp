@@ -9,11 +9,11 @@
 
 #include "crypto/wrapping.h"
 
-// Deliberate: limbs have 32 bits, and every sum and product of limbs is computed in 32 bits, even
-// on 64-bit processors. All processors compute in the same way, in half limbs, and the compiler
-// needs no double-width type. The object code for the device has no wider multiplication either
-// (scripts/check android checks this). For another processor, a compiler may use a wider
-// multiplication for a vector of half limbs, as gcc does for x86-64.
+// Deliberate: limbs have 32 bits, and this source code computes every sum and product of limbs in
+// 32 bits, even for 64-bit processors. It multiplies half limbs, so the compiler needs no
+// double-width type. The object code for the device has no wider multiplication either
+// (scripts/check android checks this). A compiler for another processor can choose a wider
+// multiplication: gcc does so for x86-64, for a vector of half limbs.
 
 namespace {
 
@@ -198,7 +198,7 @@ int mpi_mod_mpi(mpi* R, const mpi* A, const mpi* B) {
   if (mpi_compare_abs(&X, B) >= 0) {
     if (const int result = reduce(&X, B)) return result;
   }
-  // The magnitude is now below the divisor's, so adding the divisor once makes a negative remainder
+  // The magnitude of X is now below abs(B), so adding abs(B) once makes a negative remainder
   // positive.
   if (sign_of(&X) < 0) {
     if (const int result = mpi_sub_abs(&X, B, &X)) return result;
@@ -238,9 +238,9 @@ namespace {
 // Wipes and frees the limbs of X. X still points at them afterwards.
 void release_limbs(mpi* X) {
   clear_limbs(X);
-  // A compiler may drop a store to memory that is about to be freed. The compiler must assume that
-  // the empty assembly reads these zeros, and so it stores them. No test can check this, because
-  // gcc 12 and clang 14 store the zeros even without the assembly.
+  // A compiler could drop the zeros of clear_limbs, because the memory is about to be freed. It
+  // must assume that the empty assembly reads these zeros, and therefore stores them. No test can
+  // check this, because gcc 12 and clang 14 store the zeros even without the assembly.
   __asm__ __volatile__("" : : "r"(X->p) : "memory");
   free(X->p);
 }

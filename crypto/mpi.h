@@ -68,8 +68,8 @@ int mpi_to_bytes(const mpi* X, uint8_t* bytes, size_t len);
 int mpi_msb(const mpi* X);
 
 // mpi_compare_abs compares the magnitudes of A and B, and mpi_compare their values. Both return a
-// number below, equal to or above 0 for A < B, A = B and A > B. Two zeros are equal even if their
-// signs differ.
+// number below, equal to or above 0 if A is less than, equal to or greater than B. Two zeros are
+// equal even if their signs differ.
 int mpi_compare_abs(const mpi* A, const mpi* B);
 int mpi_compare(const mpi* A, const mpi* B);
 

@@ -73,8 +73,9 @@ int window_size(int bits) {
   return bits > 671 ? 6 : bits > 239 ? 5 : bits > 79 ? 4 : bits > 23 ? 3 : 1;
 }
 
-// Computes the powers W[i] = W[1]^i for each index i of w bits whose highest bit is set. A window
-// starts with a set bit, so no other power is needed. For w = 1, the only power is W[1].
+// Computes the powers W[i] = W[1]^i for each index i of w bits whose highest bit is set. A full
+// window starts with a set bit, so it needs no other power. The exponent bits after the last full
+// window need only W[1].
 int fill_window(mpi_local* W, int w, montgomery* m) {
   const int j = 1 << (w - 1);
   if (const int result = m->copy(&W[j], &W[1])) return result;

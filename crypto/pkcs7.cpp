@@ -22,7 +22,7 @@ struct Block {
   // within `bound` bytes from `offset`.
   bool Read(size_t offset, size_t bound, asn1_hdr* hdr) const;
   // Reads the header at `offset`. The element must end at or before `end`, which must be inside the
-  // block.
+  // block or at its end.
   bool ReadInside(size_t offset, size_t end, asn1_hdr* hdr) const;
   // The offsets where an element's contents start, and where they end.
   size_t Enter(const asn1_hdr& hdr) const { return static_cast<size_t>(hdr.payload - bytes); }
@@ -56,8 +56,8 @@ bool ReadBlock(const Block& block, pkcs7* record) {
   asn1_hdr certificates;
   x509_certificate certificate;
   if (!ReadHeaders(block, &certificates)) return Fail("processPKCS7Header() error");
-  // Deliberate: this failure prints only the line of ReadCertificate. Every other failure prints a
-  // second line, which names the step.
+  // Deliberate: if the certificate cannot be parsed, only the line of ReadCertificate is printed.
+  // Every other failure prints a second line, which names the step.
   if (!ReadCertificate(block, certificates, &certificate, record)) return false;
   if (!ReadPublicKey(block, certificate, record)) return Fail("processPublicKey() error");
   return ReadSigner(block, certificates, record) || Fail("processSignHeader() error");
@@ -166,11 +166,11 @@ bool ReadSigner(const Block& block, const asn1_hdr& certificates, pkcs7* record)
     return Fail("PUBLIC KEY ERROR: parse algorithm identifier");
   }
 
-  // Deliberate: the next two elements are found by position, and their tags are not checked. If a
-  // SignerInfo has authenticated attributes, its digestEncryptionAlgorithm is read as the
-  // encryptedDigest, and the package is then refused. This is intended, because the real signature
-  // covers only the attributes, not the signature file itself. The bound for both elements is the
-  // distance from the start of the block to the end of the digestAlgorithm.
+  // Deliberate: the two elements after the digestAlgorithm are found by position, and their tags
+  // are not checked. If a SignerInfo has authenticated attributes, its digestEncryptionAlgorithm is
+  // read as the encryptedDigest, and the package is then refused. This is intended, because the
+  // real signature covers only the attributes, not the signature file itself. The bound for both
+  // elements is the distance from the start of the block to the end of the digestAlgorithm.
   const size_t bound = block.Skip(algorithm);
   asn1_hdr encryption, digest;
   if (!block.Read(bound, bound, &encryption) ||
@@ -182,7 +182,7 @@ bool ReadSigner(const Block& block, const asn1_hdr& certificates, pkcs7* record)
   return true;
 }
 
-// Reads the AlgorithmIdentifier at `offset`, which must end at or before `end`. It may name any
+// Reads the AlgorithmIdentifier at `offset`. It must end at or before `end`, and may name any
 // algorithm, because the tool uses the digest algorithm that the signature itself names.
 bool ReadDigestAlgorithm(const Block& block, size_t offset, size_t end, asn1_hdr* algorithm) {
   asn1_oid oid;

@@ -12,8 +12,8 @@ constexpr size_t kMd5Size = 16;
 constexpr size_t kSha1Size = 20;
 constexpr size_t kSha256Size = 32;
 
-// The start of a DigestInfo, before the digest (RFC 8017 §9.2, note 1). MD2, MD4 and MD5 differ in
-// one byte, which is 0 here.
+// The start of a DigestInfo, before the digest (RFC 8017 §9.2, note 1). The starts for MD2, MD4 and
+// MD5 differ in one byte, which is 0 in kMdPrefix.
 constexpr uint8_t kMdPrefix[] = {0x30, 0x20, 0x30, 0x0c, 0x06, 0x08, 0x2a, 0x86, 0x48,
                                  0x86, 0xf7, 0x0d, 0x02, 0x00, 0x05, 0x00, 0x04, 0x10};
 constexpr size_t kMdAlgorithmIndex = 13;
@@ -83,7 +83,7 @@ namespace {
 
 // Stores the exponent as a signed 32-bit number. Deliberate: if memory runs out, the exponent stays
 // empty and no error is returned. An empty exponent verifies no signature, because every power is
-// then 1.
+// then 1, which has no valid padding.
 WRAPS_ON_PURPOSE void set_exponent(mpi* E, uint32_t exponent_value) {
   if (exponent_value == 0 || mpi_grow(E, 1) != 0) return;
   const bool negative = exponent_value > INT32_MAX;
@@ -121,8 +121,8 @@ bool holds(const uint8_t* info, const uint8_t* prefix, size_t prefix_size, const
   return memcmp(info, prefix, prefix_size) == 0 && memcmp(info + prefix_size, digest, size) == 0;
 }
 
-// Deliberate: MD2, MD4 and MD5 share the prefix, but only MD5 is supported. A different prefix is
-// not logged.
+// Deliberate: only MD5 is supported. A prefix that differs only in the algorithm's byte, such as
+// that of MD2 or MD4, is logged as invalid padding. Any other prefix is refused without a message.
 int check_md5(uint8_t* info, const uint8_t* md5) {
   const uint8_t algorithm = info[kMdAlgorithmIndex];
   info[kMdAlgorithmIndex] = 0;

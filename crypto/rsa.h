@@ -1,9 +1,9 @@
 // RSA PKCS#1 v1.5 signature verification (RFC 8017 §8.2.2) with the integers of crypto/mpi.h.
 //
 // A context owns the limbs of its two numbers; an rsa_local releases them. No pointer to the
-// caller's bytes is kept after a call. A refused DigestInfo is logged at error priority. Only a
-// DigestInfo that is as long as one for MD5, but has a wrong prefix, is refused without a message.
-// No other refusal is logged.
+// caller's bytes is kept after a call. Of all refusals, only that of a DigestInfo is logged, at
+// error priority. Exception: a DigestInfo that is as long as one for MD5, but has a wrong prefix,
+// is refused without a message.
 #pragma once
 
 #include <cstdint>
@@ -46,13 +46,14 @@ inline constexpr int kRsaPublicFlag = 16;
 // Loads a public key into `ctx`, which must not be null. Limbs that `ctx` owned before are not
 // freed.
 //
-// `modulus` is unsigned, big-endian, and has `len` bytes. If it is null, both numbers are empty
-// afterwards. `exponent` has the same form and length. If `exponent` is null, the exponent is
+// `modulus` is unsigned, big-endian, and has `len` bytes. If `modulus` is null, both numbers are
+// empty afterwards. `exponent` has the same form and length. If `exponent` is null, the exponent is
 // `exponent_value`, read as a signed number. A `len` of 0 leaves both numbers empty and does not
 // change the context's `len`. A context with an empty modulus verifies nothing.
 //
-// Returns 0, or kRsaKeyFlag | kMpiNoMemory (9) with both numbers empty. If memory runs out only for
-// `exponent_value`, returns 0 and leaves the exponent empty: the key then verifies nothing.
+// Returns 0, or kRsaKeyFlag | kMpiNoMemory (9) with both numbers empty. Exception: if memory runs
+// out only for `exponent_value`, returns 0 and leaves the exponent empty. The key then verifies
+// nothing.
 int rsa_set_key(rsa_context* ctx, const uint8_t* modulus, const uint8_t* exponent,
                 uint32_t exponent_value, uint32_t len);
 

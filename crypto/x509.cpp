@@ -170,10 +170,10 @@ bool ParseAlgorithm(Range* range, asn1_oid* oid, asn1_oid* params) {
 }
 
 // Reads a Name (RFC 5280 §4.1.2.4). Stores the position after it in `next`. Returns 0 for success,
-// -3 for a missing SEQUENCE, -7 for a missing SET, and -8 for a missing attribute type. Returns -1
-// if an attribute's value is missing or not universal. Also returns -1 if a value that must be kept
-// contains a NUL, or if kX509MaxAttributes values are already kept. The caller returns -12 for each
-// of these codes. `name` is empty after a failure.
+// -3 for a missing SEQUENCE, -7 for a missing SET, and -8 for a missing or malformed attribute
+// type. Returns -1 if an attribute's value is missing or not universal. Also returns -1 if a value
+// that must be kept contains a NUL, or if kX509MaxAttributes values are already kept. The caller
+// returns -12 for every failure. `name` is empty after a failure.
 int x509_parse_name(const uint8_t* buf, size_t len, x509_name* name, const uint8_t** next) {
   Range range = {buf, len};
   asn1_hdr hdr;
@@ -285,7 +285,8 @@ bool ParsePublicKeyInfo(Range* tbs, x509_certificate* cert) {
 
 int ParseOptionalFields(Range tbs, x509_certificate* cert) {
   constexpr uint32_t kExtensionsTag = 3;
-  // Deliberate: a v1 certificate should not have these fields. If it has them, they are not read.
+  // Deliberate: a v1 certificate should not have unique identifiers or extensions. If it has them,
+  // they are not read.
   if (tbs.length == 0 || cert->version == 0) return 0;
   asn1_hdr hdr;
   if (!Next(&tbs, &hdr) || hdr.class_ != kAsn1Context) return -5;
@@ -413,8 +414,8 @@ bool KeepAltName(const asn1_hdr& hdr, x509_name* name) {
   }
 }
 
-// Other programs may read a text only up to a NUL. A text with a NUL is therefore refused, and the
-// field becomes empty.
+// Many programs read a text only up to its first NUL, and would see another text. A text with a NUL
+// is therefore refused, and the field becomes empty.
 bool KeepText(const asn1_hdr& hdr, const uint8_t** text, uint64_t* length) {
   const bool good = !HoldsNul(hdr);
   *text = good ? hdr.payload : nullptr;

@@ -1,6 +1,6 @@
 // Reads one X.509 certificate (RFC 5280 §4.1) into a record that points into the caller's bytes.
-// Only the structure is read. Dates, signatures and chains are not checked here. The function
-// neither allocates nor logs. The caller's bytes must outlive the record.
+// Only the structure is read. Dates, signatures and chains are not checked here.
+// x509_certificate_parse neither allocates nor logs. The caller's bytes must outlive the record.
 #pragma once
 
 #include <cstddef>
@@ -35,9 +35,9 @@ struct x509_name_attribute {
 
 inline constexpr size_t kX509MaxAttributes = 20;
 
-// A distinguished name, with the alternative names from its extension. A missing part is a null
-// pointer with length 0. If there are several e-mail addresses, or several alternative names of one
-// kind, the last one is kept.
+// A distinguished name, with the alternative names from the certificate's extension. A missing part
+// is a null pointer with length 0. If there are several e-mail addresses, or several alternative
+// names of one kind, the last one is kept.
 struct x509_name {
   x509_name_attribute attributes[kX509MaxAttributes];  // in order of appearance
   uint64_t attribute_count;

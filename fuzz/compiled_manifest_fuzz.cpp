@@ -1,7 +1,8 @@
 // apk/android_manifest.cpp: any bytes as the compiled Android manifest. The sanitizers do not check
 // the platform's parser. The tool's buffer for the bytes therefore ends right before memory that
 // cannot be read. The tool compares texts without conversion. A second reader, in this file,
-// converts texts to UTF-8 before it compares them. Both readers must find the same facts.
+// converts texts to UTF-8 before it compares them. Both readers must find the same facts. A
+// document with an element of more than 1000 attributes is not compared.
 #include <androidfw/ResourceTypes.h>
 #include <utils/String8.h>
 
@@ -21,8 +22,9 @@ struct Facts {
   bool asks = false;
 };
 
-// The conversion drops unpaired surrogates. As in the tool, a text does not match if it is longer
-// than the wanted text by more than this many UTF-16 units.
+// The conversion drops unpaired surrogates, so a longer text can equal the wanted text. As in the
+// tool, a text does not match if it is longer than the wanted text by more than this many UTF-16
+// units.
 constexpr size_t kMostDropped = 16;
 
 bool Is(const char16_t* text, size_t length, const std::string& wanted) {

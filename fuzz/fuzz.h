@@ -1,5 +1,5 @@
-// The parts that the fuzz targets share: a way to fail, and a check that bytes are inside other
-// bytes. Each target is one file, <target>_fuzz.cpp, and one program.
+// Two functions that the fuzz targets share: a way to fail, and a check that bytes are inside other
+// bytes. Each target is one program, whose entry point is in <target>_fuzz.cpp.
 #pragma once
 
 #include <fuzzer/FuzzedDataProvider.h>

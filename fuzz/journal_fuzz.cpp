@@ -30,7 +30,8 @@ void JudgeText(std::string_view bytes) {
   const std::string encoded = EncodeText(bytes);
   Require(!HasHidden(encoded) && encoded.find('\n') == std::string::npos,
           "the encoded text has no hidden character");
-  Require(DecodeText(json::parse(encoded).get<std::string>()) == bytes, "the same bytes come back");
+  Require(DecodeText(json::parse(encoded).get<std::string>()) == bytes,
+          "the encoded text decodes to the same bytes");
   DecodeText(bytes);
   for (const bool has_utf8 : {false, true}) {
     const std::string shown = Printable(bytes, {false, has_utf8});

@@ -1,6 +1,6 @@
-// Second parsers for the texts that the tool parses. The fuzz targets compare the results of these
-// parsers with the tool's. These parsers work in another way, so that the same fault is unlikely in
-// both.
+// Second parsers for JAR manifests and for base64. The fuzz targets compare their results with
+// those of the tool's parsers. The second parsers work in another way than the tool's, so that both
+// are unlikely to have the same fault.
 #pragma once
 
 #include <cstdint>

@@ -15,13 +15,13 @@ namespace {
 // A number of the tool.
 struct Number : mpi_local {
   void Set(const std::vector<uint32_t>& limbs, int sign) {
-    Require(mpi_grow(this, static_cast<int>(limbs.size())) == 0, "memory");
+    Require(mpi_grow(this, static_cast<int>(limbs.size())) == 0, "mpi_grow succeeds");
     std::copy(limbs.begin(), limbs.end(), p);
     s = sign;
   }
 };
 
-// The same number in GMP.
+// A number of GMP: a copy of a number of the tool, or a result that GMP computes.
 class Expected {
  public:
   Expected() { mpz_init(value_); }

@@ -119,7 +119,7 @@ std::string PathOf(int fd) {
   return std::filesystem::read_symlink("/proc/self/fd/" + std::to_string(fd)).string();
 }
 
-// Checks with the model that the tool may send each of its requests to the phone.
+// Checks with the model that the tool is allowed to send each of its requests to the phone.
 class Judge {
  public:
   Judge(const Bytes& archive, const Phone& phone) : archive_(archive), phone_(phone) {}
@@ -180,8 +180,8 @@ class Judge {
   std::optional<PackageModel> model_;
 };
 
-// Replaces each library when the tool opens it for the second time. This is between the check and
-// the signing of the library.
+// Replaces each library when the tool opens it for the second time. The second opening is between
+// the check and the signing of the library.
 class Attacker {
  public:
   void BeforeOpen(const std::string& path) {
@@ -218,8 +218,8 @@ void RunTool(const std::string& path) {
 
 }  // namespace
 
-// The tool never closes its archive, because its process ends. This process continues, so it keeps
-// the archives and closes them after each run.
+// The tool never closes its archive, because its process ends. The fuzz target's process continues,
+// so it keeps the archives and closes them after each run.
 extern "C" {
 int32_t __real__Z13OpenArchiveFdiPKcPP10ZipArchiveb(int, const char*, ZipArchiveHandle*, bool);
 int32_t __wrap__Z13OpenArchiveFdiPKcPP10ZipArchiveb(int fd, const char* name,

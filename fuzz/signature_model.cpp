@@ -83,7 +83,7 @@ bool Same(const CBS& strict, const uint8_t* place, uint32_t length) {
 
 Bytes VerifiedKey(const pkcs7& record, const Bytes& block, const Bytes& signature_file) {
   const size_t size = record.modulus_length;
-  if (size < 16 || size > 512) return {};
+  if (size < 16 || size > 512) return {};  // the tool's limits (crypto/rsa.h)
   const Bytes modulus = Copy(record.modulus, size, block);
   const Bytes tbs = Copy(record.tbs_data, record.tbs_data_length, block);
   if (modulus.empty() || tbs.empty()) return {};

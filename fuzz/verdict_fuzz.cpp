@@ -1,7 +1,7 @@
 // Invents a package and a run of the tool on it. Compares the simulator's verdict with the answers
 // that the kernel gave in this run. If the verdict says that the kernel got a key, the kernel must
-// have got this key. The verdict must not name more signed things than the kernel signed, and must
-// report every failure. The shown text must agree with the verdict.
+// have got this key. The report must not have more signed items than the kernel signed. The verdict
+// must not be a success if anything failed. The shown text must agree with the verdict.
 #include <algorithm>
 #include <sstream>
 #include <string>
@@ -166,21 +166,21 @@ void JudgeKey(const Run& run, const PackageFacts& facts, const Report& report) {
   if (!report.key) return;
   const std::string& key = report.key->sha256;
   if (report.key->was_got) {
-    Require(IsGranted(run, "2000" + key), "the kernel got this key");
+    Require(IsGranted(run, "2000" + key), "the kernel got the reported key");
   } else {
     Require(facts.jar.key && facts.jar.key->modulus_sha256 == key,
-            "the reported key is the tool's");
+            "the reported key is the key that the tool reads");
   }
   const auto& shown = facts.jar.certificate;
   const bool is_other = shown && shown->key.modulus_sha256 != key;
   Require(HasWarning(report, cause::kCertificateOtherKey) == is_other,
-          "another key in the certificate is reported");
+          "the report warns if and only if the certificate has another key than the report");
   const auto is_foreign = [&](const NewerSignerFacts& signer) {
     return signer.certificate.key.modulus_sha256 != key;
   };
   const bool has_foreign = std::any_of(facts.newer.begin(), facts.newer.end(), is_foreign);
   Require(!has_foreign || HasWarning(report, cause::kOtherKey),
-          "another key of a newer signer is reported");
+          "the report warns if a newer signer has another key than the report");
 }
 
 void JudgeItems(const Run& run, const Report& report) {
@@ -192,20 +192,21 @@ void JudgeItems(const Run& run, const Report& report) {
     if (item.kind != ItemKind::kKey) ++done;
     const auto& names = run.registered;
     const bool is_registered = std::find(names.begin(), names.end(), item.name) != names.end();
-    Require(item.kind != ItemKind::kKey || is_registered, "libzu accepted this key");
+    Require(item.kind != ItemKind::kKey || is_registered, "libzu accepted each key that is done");
   }
   Require(done <= run.granted.size(), "the report has no more signed items than the kernel signed");
 }
 
 void JudgeVerdict(const Run& run, const PackageFacts& facts, const Report& report) {
   const bool is_good = StatusOf(report.verdict) == kAllSigned;
-  Require(!is_good || !run.granted.empty(), "the kernel signed something");
-  Require(!is_good || !run.has_failure, "a failure is reported");
+  Require(!is_good || !run.granted.empty(), "after a good verdict, the kernel signed something");
+  Require(!is_good || !run.has_failure, "after a failure, the verdict is not good");
   const bool is_refused =
       std::any_of(report.items.begin(), report.items.end(),
                   [](const Item& item) { return item.state == ItemState::kRefused; });
-  Require(!is_good || !is_refused, "a refused item is reported");
-  Require(!is_good || report.items[0].state == ItemState::kDone, "the file itself was signed");
+  Require(!is_good || !is_refused, "with a refused item, the verdict is not good");
+  Require(!is_good || report.items[0].state == ItemState::kDone,
+          "after a good verdict, the file itself was signed");
   Require(report.verdict == Verdict::kNotSimulated || !facts.was_changed,
           "a changed file is not simulated");
 }
@@ -221,14 +222,16 @@ void JudgeShown(const Report& report) {
   const size_t key = head.find(", key ");
   const std::string digest = report.key && why.empty() ? report.key->sha256 : "";
   Require(head.find(Printable(why, Look())) != std::string::npos, "the decisive reason is shown");
-  Require(!why.empty() || (key != std::string::npos) == !digest.empty(), "the key is shown");
-  Require(digest.empty() || head.compare(key + 6, 8, digest, 0, 8) == 0, "this key is shown");
+  Require(!why.empty() || (key != std::string::npos) == !digest.empty(),
+          "a line without a reason shows a key if and only if the report has one");
+  Require(digest.empty() || head.compare(key + 6, 8, digest, 0, 8) == 0,
+          "the shown key is the reported key");
   const bool is_got = all.str().find("what the kernel got") != std::string::npos;
   Require(is_got == (report.key && report.key->was_got),
           "the text says whether the kernel got the key");
   const bool is_alarmed = HasWarning(report, cause::kCertificateOtherKey);
   Require(!is_alarmed || head.find("   ! ") != std::string::npos,
-          "the warning about another key is in the verdict's line");
+          "the verdict's line has the warning that the certificate has another key");
 
   const json event = json::parse(VerdictEvent(report));
   Require(event["payload"] == report.payload, "the event has the payload");

@@ -17,7 +17,7 @@ struct FreeX509 {
 };
 
 void CheckName(const x509_name& name, const uint8_t* data, size_t size) {
-  Require(name.attribute_count <= 20, "at most 20 attributes");
+  Require(name.attribute_count <= 20, "a name has at most 20 attributes");
   for (uint64_t i = 0; i < name.attribute_count; ++i) {
     const x509_name_attribute& attribute = name.attributes[i];
     Require(attribute.type >= 1 && attribute.type <= 8, "an attribute is of a known kind");
@@ -67,14 +67,15 @@ void CompareWithLibcrypto(const x509_certificate& record) {
   X509_get0_signature(&signature, nullptr, other.get());
   Require(Same(record.signature_value, record.signature_value_length, signature->data,
                signature->length),
-          "the same signature");
+          "libcrypto finds the same signature");
   const ASN1_BIT_STRING* key = X509_get0_pubkey_bitstr(other.get());
   Require(Same(record.public_key, record.public_key_length, key->data, key->length),
-          "the same public key");
+          "libcrypto finds the same public key");
   uint8_t* tbs = nullptr;
   const int tbs_length = i2d_X509_tbs(other.get(), &tbs);
   if (tbs_length <= 0) return;
-  Require(Same(record.tbs_start, record.tbs_length, tbs, tbs_length), "the same signed bytes");
+  Require(Same(record.tbs_start, record.tbs_length, tbs, tbs_length),
+          "libcrypto finds the same signed bytes");
   OPENSSL_free(tbs);
 }
 

@@ -16,8 +16,9 @@ namespace ApkTools {
 namespace {
 
 // The starts of the lines that the tool's code logs for a refusal, and the reason that each line
-// gives. A refusal logs at most one of these lines, possibly twice, with one exception: "Can't load
-// manifest: " may follow "Parse manifest: ". The line that was logged last therefore gives the
+// gives. A refusal logs at most one of these lines, possibly twice, with one exception. The same
+// parser reads the signature file and the manifest, and logs "Parse manifest: " for both. For the
+// manifest, "Can't load manifest: " follows. The line that was logged last therefore gives the
 // reason.
 constexpr struct LoggedReason {
   const char* start;

@@ -1,11 +1,11 @@
-// A library with which other programs verify packages. It verifies one package, returns the reason
-// for a refusal, and releases the archive.
+// A library with which other programs verify packages. Each Verification verifies one package,
+// reports the reason for a refusal, and releases the archive.
 //
 // The tool's own code decides, and reports the reason only in the Android log. This library
 // therefore reads each line that the code logs, and passes the line on to the log unchanged. To
 // read the lines, it defines __android_log_print for the whole program. Link this library into
-// programs only. In a shared library, calls of this function may reach the platform's instead. The
-// reasons for refusals are then wrong or kUnknown.
+// programs only. In a shared library, calls of __android_log_print can reach the platform's
+// function instead. The reasons for refusals are then wrong or kUnknown.
 #pragma once
 
 #include <optional>
@@ -14,7 +14,8 @@
 
 namespace ApkTools {
 
-// Reasons why a file is not a good package, in the order of the checks.
+// kGood, or the reason why a file is not a good package. The reasons are in the order of the
+// checks.
 enum class Reason {
   kGood,
   kNoDescriptor,               // there is no file: the descriptor is negative

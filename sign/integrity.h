@@ -17,8 +17,8 @@ extern "C" {
 // `payload` is an unsigned 16-bit length L in host byte order, then L bytes. L may be 0. The
 // function keeps no pointer to `payload`. It fails without a request to the kernel if `payload` is
 // null, or if the integrity value of the calling task cannot be read or is 0. A task with the value
-// 0 must not sign. The function waits without a limit while the value is not settled yet. If the
-// kernel refuses, errno is the kernel's error number.
+// 0 must not sign. While the value is 0xFFFFFFFF (not settled yet), the function waits, without a
+// limit. If the kernel refuses, errno is the kernel's error number.
 uint32_t VeltSignFd(int fd, const void* payload);
 
 // Asks the kernel whether it trusts the open file `fd`. The caller's own integrity value does not

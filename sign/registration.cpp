@@ -41,7 +41,7 @@ void RegisterJar(int zip_fd, int fd) {
   ReportResult(ZuNewCertificate(fd, jar_path.c_str(), block.data(), block.size()));
 }
 
-// This function is also called for a file that is not a zip archive. The file asks for no
+// This function is also called for a file that is not a zip archive. Such a file asks for no
 // permission, so nothing happens.
 void RegisterPackage(ApkTools::Apk& apk, int fd) {
   if (!apk.IsSsPermissionRequired()) return;
@@ -72,8 +72,9 @@ std::vector<uint8_t> JarKeyBlock(const std::string& path) {
   return block;
 }
 
-// Deliberate: only this message needs the path of `fd`, so registration continues without it. The
-// text says "oat" for packages and JARs alike. Programs that parse the log match on it.
+// Logs an error if the path of `fd` cannot be found. Deliberate: the registration does not need
+// this path, so it continues. The text says "oat" for packages and JARs alike. Programs that parse
+// the log match on it.
 void ReportMissingLocation(int fd) {
   if (GetFilenameByFd(fd).empty()) LogError("Can't get oat location from fd=%d\n", fd);
 }

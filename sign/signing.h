@@ -3,8 +3,8 @@
 // Results are the codes of sign/integrity.h. Both functions log each step and each refusal. They do
 // not close the descriptors.
 //
-// Payload of a package: a 16-bit length (32, host byte order) and the SHA-256 digest of the
-// signer's RSA modulus. Payload of a plain JAR: the 16-bit length 0, no data.
+// Payload of a package and of its libraries: a 16-bit length (32, host byte order) and the SHA-256
+// digest of the signer's RSA modulus. Payload of a plain JAR: the 16-bit length 0, no data.
 #pragma once
 
 #include <cstdint>

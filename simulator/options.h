@@ -24,8 +24,8 @@ struct Options {
   FileListOptions files;  // the files for the tool: at least one name or a list
 };
 
-// Fills `options` from the command line. Returns the exit status if the program must end instead:
-// after `--help` or `--version`, or after an error, which is already printed.
+// Fills `options` from the command line. Returns the exit status if the program must end: after
+// `--help` or `--version`, or after an error, which is already printed. Otherwise returns none.
 std::optional<int> ParseOptions(int argc, char** argv, Options* options);
 
 }  // namespace simulator

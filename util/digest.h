@@ -1,13 +1,13 @@
 // One-shot digests of bytes in memory, by the platform's crypto library: MD5 (RFC 1321), SHA-1 and
 // SHA-256 (FIPS 180-4). The functions keep no state, log nothing and cannot fail. The caller owns
-// both vectors. They must be two different vectors.
+// `in` and `out`, which must be two different vectors.
 #pragma once
 
 #include <cstdint>
 #include <vector>
 
-// Each function replaces the contents of `out` by the digest of all bytes of `in`. `in` may be
-// empty.
+// Each of the next three functions replaces the contents of `out` with the digest of all bytes of
+// `in`. `in` may be empty.
 
 // 16 bytes.
 void ComputeMD5Digest(const std::vector<uint8_t>& in, std::vector<uint8_t>& out);
@@ -16,7 +16,7 @@ void ComputeSHA1Digest(const std::vector<uint8_t>& in, std::vector<uint8_t>& out
 // 32 bytes.
 void ComputeSHA256Digest(const std::vector<uint8_t>& in, std::vector<uint8_t>& out);
 
-// The digests that a signature may cover. The signature itself names the one that it covers.
+// The digests that a signature can cover. The signature itself names the one that it covers.
 struct Digests {
   std::vector<uint8_t> sha1;
   std::vector<uint8_t> sha256;

@@ -32,7 +32,7 @@ bool IsSameFile(const struct stat& before, const struct stat& after) {
 int OpenForReading(const char* path, int flags) {
   const int fd = open(path, O_RDONLY | O_NONBLOCK | flags);
   if (fd >= 0 || errno != EWOULDBLOCK) return fd;
-  // Another process holds a lease on the file. Without O_NONBLOCK, open waits until the lease ends.
+  // A process holds a lease on the file. Without O_NONBLOCK, open waits until the lease ends.
   // Meanwhile the holder could put a FIFO at the path, and open would then wait for a writer. The
   // file is therefore not opened by its path again, but through an O_PATH descriptor.
   const ScopedFd pinned(open(path, O_PATH | O_CLOEXEC));
@@ -57,8 +57,9 @@ bool ReadFile(const std::string& path, std::vector<uint8_t>& out, struct stat* s
   if (out.empty() && out.capacity() < static_cast<size_t>(size)) std::vector<uint8_t>().swap(out);
   out.resize(static_cast<size_t>(size));
   // Deliberate: reading succeeds even if the file shrinks meanwhile. The end of `out` then keeps
-  // its old bytes. Every caller compares the digest of `out` with the manifest's digest. With the
-  // old bytes, these two digests differ.
+  // its old bytes, or is 0. SignLibrary (sign/signing.cpp) compares the digest of `out` with the
+  // manifest's digest. It also compares `state` with the file's later state, so it notices a file
+  // that shrank even if the digests are equal.
   ReadBytes(fd, out);
   if (state != nullptr) *state = found;
   return true;

@@ -1,4 +1,4 @@
-// Checks whether memory is available. The function keeps no state and logs nothing.
+// Checks whether memory is available. FitsInMemory keeps no state and logs nothing.
 #pragma once
 
 #include <cstddef>

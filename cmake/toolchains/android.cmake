@@ -1,5 +1,5 @@
-# 64-bit Arm, API level 27, with any clang and lld and your own sysroot. -DCMAKE_SYSROOT=DIR names
-# the sysroot, with the target's C and C++ libraries. -DPLATFORM_INCLUDE_DIR and
+# Builds for 64-bit Arm and API level 27, with any clang, with lld, and with your own sysroot. The
+# sysroot (-DCMAKE_SYSROOT=DIR) has the target's C and C++ libraries. -DPLATFORM_INCLUDE_DIR and
 # -DPLATFORM_LIBRARY_DIR name the platform libraries (docs/porting.md).
 #
 # The system is called Linux, because CMake's own support for Android requires an NDK.
@@ -11,7 +11,7 @@ if(NOT CMAKE_SYSROOT)
   message(FATAL_ERROR "The android preset needs -DCMAKE_SYSROOT=DIR, see docs/porting.md")
 endif()
 set(CMAKE_TRY_COMPILE_PLATFORM_VARIABLES CMAKE_SYSROOT)
-# A sysroot may lack the start files of programs, so CMake must check the compiler without linking a
+# Some sysroots lack the start files of programs, so CMake must check the compiler without linking a
 # program.
 set(CMAKE_TRY_COMPILE_TARGET_TYPE STATIC_LIBRARY)
 
@@ -22,7 +22,8 @@ endif()
 set(CMAKE_CXX_COMPILER_TARGET aarch64-linux-android27)
 set(CMAKE_LIBRARY_ARCHITECTURE aarch64-linux-android)
 # The platform's C++ library is libc++. Some clang versions do not choose it for this target. Some
-# phones have pages of 16 KiB. A program that is linked for 16 KiB runs on all phones.
+# phones have pages of 16 KiB, and most have pages of 4 KiB. A program that is linked for 16 KiB
+# runs on both kinds of phones.
 set(CMAKE_CXX_FLAGS_INIT "-stdlib=libc++")
 set(CMAKE_EXE_LINKER_FLAGS_INIT "-fuse-ld=lld -Wl,-z,max-page-size=16384")
 set(CMAKE_SHARED_LINKER_FLAGS_INIT "-fuse-ld=lld -Wl,-z,max-page-size=16384")

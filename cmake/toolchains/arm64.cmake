@@ -7,7 +7,7 @@ set(CMAKE_SYSROOT ${CMAKE_CURRENT_LIST_DIR}/../../build/arm64-sysroot)
 cmake_path(NORMAL_PATH CMAKE_SYSROOT)
 set(CMAKE_CXX_COMPILER aarch64-linux-gnu-g++)
 set(CMAKE_LIBRARY_ARCHITECTURE aarch64-linux-gnu)
-# The emulator is named by its path, because tests start programs with other values of PATH.
+# The emulator is named by its path, because some tests start programs with a changed PATH.
 find_program(APKTOOLKIT_EMULATOR qemu-aarch64 NO_CMAKE_FIND_ROOT_PATH REQUIRED)
 set(CMAKE_CROSSCOMPILING_EMULATOR ${APKTOOLKIT_EMULATOR} -L ${CMAKE_SYSROOT})
 

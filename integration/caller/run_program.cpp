@@ -17,12 +17,12 @@ namespace {
 constexpr int kCannotBecome = 127;
 
 // Everything that the child needs. It is made before the fork, because the child must not allocate
-// memory. Another thread may hold the allocator's lock at the fork, and nobody would release this
+// memory. Another thread can hold the allocator's lock at the fork, and nobody would release this
 // lock in the child.
 struct Child {
   std::vector<char*> arguments;  // ends with a null pointer
   int null;                      // /dev/null, at a number above the standard streams
-  int descriptors;               // all descriptors are below this number
+  int descriptors;               // the child closes each descriptor from 3 to this number - 1
   rlim_t memory_bytes;
 };
 

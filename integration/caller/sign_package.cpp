@@ -4,7 +4,7 @@
 
 namespace {
 
-// Statuses of apktoolkit-bound. Other statuses are the tool's.
+// Statuses of apktoolkit-bound. Any other status is apktoolkit's.
 constexpr int kStatusOtherSigner = 3;
 constexpr int kStatusNoJarSigner = 4;
 constexpr int kStatusNotStarted = 5;

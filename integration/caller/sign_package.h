@@ -5,8 +5,8 @@
 // are beside it. It must be called before any code of the package is run, mapped, or compiled ahead
 // of time (dexopt). From the call on, nobody may write to the package or beside it. The caller must
 // not hold a lock: the call may take as long as the limits allow. After an update of the system,
-// the kernel may no longer trust files that it signed before. SignPackage must therefore be called
-// for every installed package (main.cpp).
+// the kernel can refuse to trust files that it signed before. SignPackage must therefore be called
+// again for every installed package (main.cpp).
 #pragma once
 
 #include <string>
@@ -33,11 +33,11 @@ enum class SignOutcome {
 // Runs the programs apktoolkit-verify, apktoolkit-bound and apktoolkit in `directory`
 // ("/system/bin").
 //
-// The product decides how to react. It should treat an untrusted package like a package for which
-// the kernel has no payload (the digest of the signer's key). After kTimedOut and kOutOfMemory the
-// libraries may be signed, because apktoolkit signs them first. The package itself is not trusted:
-// if it were, the result would be kTrusted. Do not try again at once: the same file takes the same
-// time.
+// The caller decides how to react. It should treat an untrusted package like a package for which
+// the kernel has no payload (the digest of the signer's key). After kTimedOut and kOutOfMemory,
+// some libraries can be signed already, because apktoolkit signs them first. The package itself is
+// not trusted: if it were, the result would be kTrusted. Do not try again at once: the same file
+// needs the same time and memory.
 SignOutcome SignPackage(const std::string& directory, const InstalledPackage& package,
                         const RunLimits& limits);
 

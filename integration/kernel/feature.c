@@ -1,8 +1,9 @@
 // SPDX-License-Identifier: GPL-2.0-only OR Apache-2.0
 /*
  * The file-integrity feature on an ordinary kernel, only for tests. It is the smallest feature that
- * apktoolkit works with. It is NOT for a product: every task may have every file signed, and a
- * parameter sets the integrity value of every task (docs/porting.md explains what a product needs).
+ * apktoolkit works with. It is NOT for a product: a task that can read a regular file can have it
+ * signed, and a parameter sets the integrity value of every task (docs/porting.md explains what a
+ * product needs).
  *
  *   fcntl(fd, 1124, payload)   signs: keeps the payload, and the SHA-256 digest of the file's
  *                              bytes, in an extended attribute of the file
@@ -65,7 +66,8 @@ struct signature {
 } __packed;
 
 /* Returns a signature whose digest is not set, or an error pointer. The caller must free the
- * signature. Each byte of the payload is read only once, because the task may change it. */
+ * signature. Each byte of the payload is read only once, because the task can change the byte
+ * between two reads. */
 static struct signature *copy_payload(const u8 __user *payload)
 {
 	struct signature *signature;
@@ -83,7 +85,7 @@ static struct signature *copy_payload(const u8 __user *payload)
 	return ERR_PTR(-EFAULT);
 }
 
-/* A product must prevent later changes of the file. Here its bytes may still change. */
+/* A product must prevent later changes of the file. This module does not. */
 static int digest_file(struct file *file, u8 digest[SHA256_DIGEST_SIZE])
 {
 	struct sha256_state state;
@@ -173,7 +175,7 @@ static int verify(int fd, struct file *file)
 	return error;
 }
 
-/* Replaces the system call fcntl, for the two commands alone. */
+/* Replaces the system call fcntl, only for SIGN_COMMAND and VERIFY_COMMAND. */
 static asmlinkage long integrity_fcntl(struct pt_regs *call)
 {
 	unsigned long arguments[6];
@@ -311,7 +313,7 @@ static int look_up_entered(struct kprobe *probe, struct pt_regs *registers)
 	return 1;
 }
 
-/* A post handler keeps the kernel from optimising the probe into a jump, which cannot redirect. */
+/* A post handler keeps the kernel from replacing the probe by a jump. A jump cannot redirect. */
 static void after(struct kprobe *probe, struct pt_regs *registers, unsigned long flags)
 {
 }

@@ -10,8 +10,9 @@ struct file;
 /* Opens the file for appending. Returns 0 or a negative error number. */
 int journal_open(void);
 
-/* file: the file that is open as fd, or NULL. payload: `size` bytes, which begin with the payload's
- * length; `size` is 0 if the payload was not read. error: 0 or a negative error number. */
+/* file: the file that is open as fd, or NULL. payload: the two bytes of the payload's length, and
+ * the payload; together `size` bytes. `size` is 0 if the payload was not read. error: 0 or a
+ * negative error number. */
 void journal_sign(int fd, struct file *file, const void *payload, size_t size, int error);
 void journal_verify(int fd, struct file *file, int error);
 

@@ -15,8 +15,8 @@ import java.util.LinkedHashSet;
 import java.util.Set;
 
 /**
- * Names each signer that the package manager knows for a package, by the same digest that
- * apktoolkit passes to the kernel. Use this class in the process that installs packages.
+ * Names the current RSA signers that the package manager knows for a package, by the same digest
+ * that apktoolkit passes to the kernel. Use this class in the process that installs packages.
  *
  * <p>The package manager uses the newest signing block that it knows. apktoolkit uses the JAR
  * signature, whose signer can be a different one. Pass a package to apktoolkit only if its JAR
@@ -29,7 +29,7 @@ public final class SignerDigests {
     /**
      * Returns the digests of the current signers of an installed package. Needs API level 28 or
      * later ({@code PackageManager.GET_SIGNING_CERTIFICATES}). If the key was rotated, earlier keys
-     * are left out on purpose, because somebody else may have a retired key. apktoolkit passes only
+     * are left out on purpose, because somebody else can have a retired key. apktoolkit passes only
      * a digest of the key to the kernel, not the name of the package. The kernel could therefore
      * not distinguish that person's packages from the owner's.
      */

@@ -2,13 +2,13 @@
 // FILE is one of the signers that the package manager knows for this package. Otherwise it ends
 // with one of its own exit statuses.
 //
-// The package manager uses the newer signing block. apktoolkit uses the JAR signature. No other
-// program on the phone compares the signers of these two signatures (docs/threat-model.md, "Before
-// you ship it"). DIGESTS comes from SignerDigests.java: the SHA-256 digest of the RSA modulus of
-// each of the package manager's signers, in lower-case hexadecimal, separated by commas. This
-// program finds the JAR signer with the tool's own code, so it finds the same signer as the tool.
-// It is a separate program because that code ends the process if memory runs out, and does not free
-// all of its memory.
+// The package manager uses the APK signing block (v2 or later) of a package that has one.
+// apktoolkit always uses the JAR signature. No other program on the phone compares the signers of
+// these two signatures (docs/threat-model.md, "Before you ship it"). DIGESTS comes from
+// SignerDigests.java: for each RSA signer that the package manager knows, the SHA-256 digest of the
+// modulus, in lower-case hexadecimal, separated by commas. This program finds the JAR signer with
+// the tool's own code, so it finds the same signer as the tool. It is not a part of its caller,
+// because the tool's code ends the process if memory runs out, and does not free all of its memory.
 #include <fcntl.h>
 #include <unistd.h>
 
@@ -26,7 +26,7 @@
 
 namespace {
 
-// The statuses 0 and 1 are those of the command, apktoolkit.
+// The command, apktoolkit, ends with 0 or 1, so these are other numbers.
 constexpr int kUsageError = 2;
 constexpr int kOtherSigner = 3;
 constexpr int kNoJarSigner = 4;

@@ -49,7 +49,7 @@ public final class InstallerVerifier {
     public static void main(String[] arguments) throws Exception {
         int first = Integer.parseInt(arguments[0]);
         int last = Integer.parseInt(arguments[1]);
-        // Only answers may be written to standard output. All other output is dropped.
+        // Standard output must have only answers. All other output is dropped.
         PrintStream answers = System.out;
         System.setOut(new PrintStream(OutputStream.nullOutputStream()));
         BufferedReader paths =
@@ -88,8 +88,9 @@ public final class InstallerVerifier {
 
     // The verifier answers for all levels of a range at once, and names one signer for all of them.
     // For a package with v3 or v3.1, the levels are therefore split where the scheme begins, and
-    // where one of its signers begins or ends. For other packages, all levels are one range. If a
-    // range is refused, the levels are also split at NEW_RULES, and all ranges are verified again.
+    // where the levels of one of its signers begin or end. For other packages, all levels are at
+    // first one range. If a range is refused, the levels are also split at NEW_RULES, and all
+    // ranges are verified again.
     private static String ranges(DataSource source, int first, int last) throws Exception {
         SortedSet<Integer> starts = new TreeSet<>();
         boolean hasNewer = NewerSigners.read(source, starts);
@@ -172,9 +173,9 @@ public final class InstallerVerifier {
 
     // Returns the verifier's answer for these levels. Phones of API 30 and later require v2 if the
     // app targets 30 or later. The verifier checks this only if the range includes the app's target
-    // level. A range that ends at 30 or later is therefore verified without an upper end. This
-    // changes no other answer. Packages with v3 or v3.1 are an exception, because their signers may
-    // be for some levels only.
+    // level. If the package has neither v3 nor v3.1, a range that ends at 30 or later is therefore
+    // verified without an upper end. This changes no other answer. With v3 or v3.1 it could,
+    // because their signers may be for some levels only.
     private static Range verify(DataSource source, int first, int last, boolean hasNewer)
             throws Exception {
         if (first >= KNOWS_V31 && !hasMethod(ApkVerifier.Result.class, "isVerifiedUsingV31Scheme")
@@ -304,7 +305,7 @@ public final class InstallerVerifier {
         private static final int MOST_SIGNERS = 100;
 
         // Adds the first level of each scheme and of each signer, and the level after each signer's
-        // last one. Returns true if the package has one of the two schemes.
+        // last level. Returns true if the package has v3 or v3.1.
         static boolean read(DataSource source, SortedSet<Integer> starts) {
             boolean hasAny = false;
             for (int id : new int[] {V3, V31}) {

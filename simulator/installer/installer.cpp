@@ -45,7 +45,7 @@ std::optional<std::string> Installer::Missing() const {
   return {};
 }
 
-// The Java program reads one path per line, but a file's own name may contain a line feed. The
+// The Java program reads one path per line, but a file's own name can contain a line feed. The
 // program therefore gets the path of this process's descriptor.
 Judgement Installer::Judge(const std::string& file) {
   if (options_.use == InstallerUse::kOff) return {};

@@ -1,7 +1,7 @@
 // The installer of the phones: the platform's own verifier, apksig, in a Java program
-// (InstallerVerifier.java). One process of this program judges all packages of a run: it answers
-// whether phones install them. It is started for the first package. If it fails on a package, the
-// next package starts a new process.
+// (InstallerVerifier.java). One process of this program answers for all packages of a run whether
+// phones install them, unless it fails. It is started for the first package. After it fails on a
+// package, the next package starts a new process.
 #pragma once
 
 #include <sys/types.h>
@@ -40,8 +40,8 @@ class Installer {
   std::optional<std::string> Missing() const;
 
   // Asks the phones' installer about the file. The result is kNotAsked for a file that is not a
-  // package, and for every file with kOff. Several threads may call it; the packages are judged one
-  // after the other.
+  // package, and for every file with kOff. Several threads may call Judge; the packages are judged
+  // one after the other.
   Judgement Judge(const std::string& file);
 
  private:

@@ -1,6 +1,6 @@
 // The judgement of apksig, the platform's own verifier: whether a phone's installer installs the
-// package. apksig runs in a separate program, which may have read a hostile file. A malformed
-// answer of that program counts as no answer.
+// package. apksig runs in a separate program, which reads hostile files. Its answer is therefore
+// not trusted: a malformed answer counts as no answer.
 #pragma once
 
 #include <climits>
@@ -33,7 +33,7 @@ struct InstallerSigner {
   CertificateFacts certificate;
 };
 
-// The judgement of the phones with these API levels.
+// The judgement of the phones in one range of API levels.
 struct RangeJudgement {
   LevelRange levels = {0, 0};
   bool is_verified = false;

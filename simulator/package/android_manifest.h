@@ -14,13 +14,14 @@ struct AndroidManifest {
   // The strings of the document overlap. The platform's parser could then use many times the
   // document's size in memory, so the document is not read.
   bool has_overlaps = false;
-  // The package's name as the tool's own code reads it; none if the document cannot be read.
+  // The package's name as the tool's own code reads it; none if the strings overlap or the document
+  // does not parse.
   std::optional<std::string> package_name;
   // The package's name by the installer's rules: the root's attribute "package" without a
   // namespace. UTF-8, up to the first NUL.
   std::string installer_name;
-  // The attribute extractNativeLibs of the first application; none if it has no such attribute with
-  // a boolean or integer value.
+  // The attribute extractNativeLibs of the first application; none if this application has no such
+  // attribute with a boolean or integer value.
   std::optional<bool> extracts_libraries;
 };
 

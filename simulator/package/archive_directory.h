@@ -30,7 +30,8 @@ struct ArchiveEntry {
 std::optional<ArchiveEnd> FindArchiveEnd(int fd);
 
 // Returns the entries in the order of the directory. Ends at the first malformed record. The
-// directory does not show damaged data, so `is_damaged` is false in all results.
+// directory does not show which entries are damaged, so `is_damaged` is false in all results.
+// Archive::Entries sets it later.
 std::vector<ArchiveEntry> ReadDirectory(int fd, const ArchiveEnd& end);
 
 // Reads `size` bytes of the file from `offset` on. Returns fewer if the file ends earlier or cannot

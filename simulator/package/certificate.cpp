@@ -133,8 +133,8 @@ std::optional<int64_t> SecondsOf(const ASN1_TIME* time) {
 }
 
 // Writes the RelativeDistinguishedNames in reverse order, and the attributes inside each of them in
-// their own order. Names with more than kMostAttributes attributes are cut. Real names have at most
-// ten.
+// their own order. Names with more than kMostAttributes attributes are cut. Ordinary names have far
+// fewer.
 std::string NameText(const X509_NAME* name) {
   constexpr int kMostAttributes = 256;
   std::string text, part;

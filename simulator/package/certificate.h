@@ -16,7 +16,8 @@ struct PublicKey {
   std::string algorithm;  // "RSA", "EC" or "DSA"; else the library's name
   int bits = 0;           // 0: not known
   std::string sha256;     // of the SubjectPublicKeyInfo; digests are in lower-case hexadecimal
-  // Of the modulus without leading zeros; empty if the library cannot read an RSA key.
+  // Of the modulus without leading zeros; empty if this is not an RSA key that the library can
+  // read.
   std::string modulus_sha256;
 };
 
@@ -34,8 +35,9 @@ struct CertificateFacts {
   std::optional<int64_t> not_after;
   PublicKey key;
   // A SignerIdentifier (RFC 5652) names a certificate by issuer and serial number, or by the
-  // subject key identifier. These are its contents in the two cases, for this certificate. `key_id`
-  // is empty if the certificate has no subject key identifier.
+  // subject key identifier. `issuer_and_serial` and `key_id` are the contents of such a
+  // SignerIdentifier for this certificate. `key_id` is empty if the certificate has no subject key
+  // identifier.
   std::string issuer_and_serial;
   std::string key_id;
 };

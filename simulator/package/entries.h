@@ -36,7 +36,7 @@ struct PackageEntries {
 
 // True if the time is up.
 using IsLate = std::function<bool()>;
-// For callers without a limit.
+// For callers without a time limit.
 inline bool IsNeverLate() { return false; }
 
 // `manifest`: the text of META-INF/MANIFEST.MF; may be empty.

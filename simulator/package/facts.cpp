@@ -163,7 +163,7 @@ void FindLibraries(const Archive& archive, const std::string& path, PackageFacts
   }
 }
 
-// Opens the file at the library's place as the tool does.
+// Opens the file at the library's place like the tool, but does not wait for the holder of a lease.
 LibraryFacts FindLibrary(const std::string& entry, const std::string& path) {
   LibraryFacts library;
   library.entry = entry;

@@ -1,6 +1,6 @@
 // The facts that the simulator finds in a file: its kind and, for a package, its signer, the
 // entries that the signature lists, and the libraries beside it. The facts explain the tool's
-// answer and decide nothing. A malformed part counts as missing.
+// answer and decide nothing. The facts of a malformed part are missing.
 #pragma once
 
 #include <cstdint>

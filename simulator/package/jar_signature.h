@@ -18,7 +18,7 @@ namespace simulator {
 // An RSA key as the tool reads it from a signature block. Other readers of the certificate may find
 // another key.
 struct ToolKey {
-  std::string modulus_sha256;  // as in the payload that the kernel gets; in hexadecimal
+  std::string modulus_sha256;  // the digest in the payload; in hexadecimal
   uint32_t size = 0;           // of the modulus, in bytes, as the tool counts them
   int bits = 0;
   int32_t exponent = 0;
@@ -43,7 +43,8 @@ struct JarSignatureFacts {
   // The first certificate; none if it cannot be parsed, or if the tool reads the key from another
   // certificate.
   std::optional<CertificateFacts> certificate;
-  bool names_other_certificate = false;  // the first signer's identifier names another certificate
+  // The first signer's identifier names a certificate other than the first one.
+  bool names_other_certificate = false;
 };
 
 JarSignatureFacts ReadJarSignature(Archive* archive);

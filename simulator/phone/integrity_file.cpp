@@ -1,6 +1,7 @@
 // The files in which the kernel publishes each task's integrity value: /proc/self/integrity/value
 // and /proc/PID/integrity/value, for callers that open them with fopen or fopen64. The files are
 // read-only. Each opening, of any task's file, delivers the next of the phone's integrity values.
+// The last value repeats.
 #include <fcntl.h>
 #include <sys/mman.h>
 #include <unistd.h>
@@ -38,14 +39,14 @@ STAND_IN FILE* fopen(const char* path, const char* mode) {
   return pid ? OpenIntegrity(*pid, mode) : next(path, mode);
 }
 
-// Programs that are built for large files call fopen by this name. On a 64-bit system, both names
-// are the same function.
+// Programs that are built for large files call fopen by the name fopen64. On a 64-bit system, both
+// names are the same function.
 STAND_IN FILE* fopen64(const char* path, const char* mode) __attribute__((alias("fopen")));
 
 namespace {
 
-// The task to which the integrity file at `path` belongs, 0 for "self". None if `path` is another
-// file.
+// The task to which the integrity file at `path` belongs, 0 for "self". None if `path` is not the
+// path of an integrity file.
 std::optional<int> TaskOf(const char* path) {
   constexpr char kBefore[] = "/proc/";
   constexpr char kAfter[] = "/integrity/value";

@@ -42,8 +42,8 @@ void Trust(int fd);
 bool IsTrusted(int fd);
 int Answer(Event* event, int error, int errno_before);
 
-// Records in the journal that the stand-ins are in place. Removes LD_PRELOAD from the environment,
-// so that programs that the tool starts do not load the stand-ins.
+// Records in the journal that this library is loaded. Removes LD_PRELOAD from the environment, so
+// that programs that the tool starts do not load this library.
 __attribute__((constructor)) void Attach() {
   const ErrnoKeeper keeper;
   Record(Event("attached").Number("pid", getpid()));

@@ -1,5 +1,5 @@
-// The stand-in for the closed process-authentication library. The tool is linked against it in the
-// same way as against the real library.
+// The stand-in for libzu: a replacement for the process-authentication library, whose source is
+// closed. The tool is linked against it in the same way as against the real library.
 #include "sign/libzu.h"
 
 #include <string_view>

@@ -62,8 +62,8 @@ STAND_IN int __android_log_buf_print(int, int priority, const char* tag, const c
   return result;
 }
 
-// The platform's C++ libraries, such as the zip library, write their warnings with one of these two
-// functions. Each generation of the log library has only one of them.
+// The platform's C++ libraries, such as the zip library, write their warnings with one of the next
+// two functions. Each generation of the log library has only one of the two.
 STAND_IN void __android_log_write_logger_data(__android_logger_data* data, const char* text) {
   ReadLogRecord(data, text, Log);
 }

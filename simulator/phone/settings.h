@@ -1,8 +1,8 @@
 // The settings of the simulated phone. apktoolkit-sim passes them to the stand-ins, the libraries
 // that answer in place of the phone. Each setting is passed in an environment variable with the
-// prefix APKTOOLKIT_SIM_. Without its variable, a setting has the default below, which is that of a
-// healthy phone. Both apktoolkit-sim and the stand-ins use this file, so that names and formats are
-// defined in one place.
+// prefix APKTOOLKIT_SIM_. Without its variable, a setting has the default below. The defaults,
+// except that of `journal`, are those of a healthy phone. Both apktoolkit-sim and the stand-ins use
+// this file, so that names and formats are defined in one place.
 #pragma once
 
 #include <sys/types.h>
@@ -30,8 +30,8 @@ struct PhoneSettings {
   // The file that the stand-ins append their events to. Empty: nothing is recorded, and libzu finds
   // no service.
   std::string journal;
-  // The contents of /proc/PID/integrity/value: one for each opening, of any task's file. The last
-  // one repeats. The list has at least one element.
+  // The texts of the files /proc/PID/integrity/value. Each opening of such a file reads the next
+  // text. The last text repeats. The list has at least one element.
   std::vector<std::string> integrity = {"1f"};
   // The files that the kernel trusts from the start.
   std::vector<FileId> trusted;

@@ -4,8 +4,8 @@ namespace simulator {
 
 namespace {
 
-// Returns the journal's descriptor, or -1 if there is no journal. The journal is opened at the
-// start, so that events are recorded even if the process has no free descriptor later.
+// Returns the journal's descriptor, or -1 if there is no journal. The journal is opened when this
+// library is loaded, so that events are recorded even if the process has no free descriptor later.
 int JournalDescriptor() {
   static const int journal =
       ThisPhone().journal.empty() ? -1 : OpenJournal(ThisPhone().journal.c_str());

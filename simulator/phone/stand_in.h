@@ -1,7 +1,7 @@
-// Shared by the two libraries that replace parts of the phone inside the tool's process
-// (stand-ins): the phone's settings, the journal, and a means to keep errno unchanged for the tool.
-// Each of the two libraries has its own copy of this code. Nothing here is destroyed at exit,
-// because the tool's last output is recorded after the destructors have run.
+// Shared by the two stand-ins: the libraries that replace the phone's kernel and libzu inside the
+// tool's process. This file has the phone's settings, the journal, and a means to keep errno
+// unchanged for the tool. Each of the two libraries has its own copy of this code. Nothing here is
+// destroyed at exit, because the tool's last output is recorded after the destructors have run.
 #pragma once
 
 #include <cerrno>
@@ -9,12 +9,12 @@
 #include "simulator/phone/journal.h"
 #include "simulator/phone/settings.h"
 
-// Marks a function that replaces one of another library. All other functions are hidden.
+// Marks a function that replaces a function of another library. All other functions are hidden.
 #define STAND_IN extern "C" __attribute__((visibility("default")))
 
 namespace simulator {
 
-// The phone of this process. The first call reads it from the environment.
+// The settings of the simulated phone. The first call reads them from the environment.
 const PhoneSettings& ThisPhone();
 
 // Appends `event` to the journal. Does nothing without a journal.

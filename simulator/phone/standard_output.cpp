@@ -27,8 +27,8 @@ __attribute__((constructor)) void ReplaceStandardOutput() {
   stdout = stream;
 }
 
-// The C library flushes `stdout` after all destructors. A destructor that runs after this one may
-// end the process before that. The last output would then be lost.
+// The C library flushes `stdout` only after all destructors. If a later destructor ended the
+// process, the last output would be lost.
 __attribute__((destructor)) void FlushStandardOutput() { fflush(stdout); }
 
 }  // namespace

@@ -81,7 +81,7 @@ std::optional<std::string> Installation::LayOut(const std::string& file, Install
     return failure(fs::path(directory).parent_path().string(), errno);
   }
   directory_ = fs::canonical(directory, error).string();
-  // No library can have this path: libraries are laid out below lib/.
+  // No library can have this path: libraries are extracted below lib/.
   const std::string copy = directory_ + "/base.apk";
   if (!PutPackage(file, source.get(), copy, deadline)) {
     return failure(std::string(kInstalledDirectory) + "base.apk", errno);
@@ -150,13 +150,13 @@ bool LiesAlone(int package, const std::vector<std::string>& libraries) {
   });
 }
 
-// `choice` decides whether the libraries for 64-bit Arm, for 32-bit Arm or for both are laid out.
-// For each of the two, an installer uses only one ABI: the first in kPhoneAbis for which the
-// package has libraries.
+// `choice` decides whether the libraries for 64-bit Arm, for 32-bit Arm or for both are extracted.
+// For each of these two processors, an installer uses only one ABI: the first in kPhoneAbis for
+// which the package has libraries.
 Layout PlanLayout(const std::vector<std::string>& entries, InstalledAbi choice,
                   std::vector<std::string>* left_out, std::set<std::string>* of_other_processors) {
   Layout layout;
-  std::set<std::string> taken;  // directories below which libraries are laid out
+  std::set<std::string> taken;  // directories for libraries that are in `layout`
   for (const char* const abi : kPhoneAbis) {
     const std::string abi_directory = kLibraryNames.prefix + std::string(abi);
     const std::string installed = ApkTools::InstalledLibraryPath("", abi_directory);

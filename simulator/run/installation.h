@@ -38,9 +38,9 @@ class Installation {
   Installation(const Installation&) = delete;
   Installation& operator=(const Installation&) = delete;
 
-  // Lays out the package at `file`. Lays out nothing if the file is not a package, keeps its
-  // libraries inside, or has no libraries for `abi`, or if `when` excludes the file. Returns the
-  // reason of a failure, else none.
+  // Lays out the package at `file`. Lays out nothing if the file is not a package, if its Android
+  // manifest keeps the libraries inside, if it has no libraries for `abi`, or if `when` excludes
+  // it. Returns the reason of a failure, else none.
   std::optional<std::string> LayOut(const std::string& file, InstallWhen when, InstalledAbi abi,
                                     const Deadline& deadline);
 

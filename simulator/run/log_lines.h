@@ -1,5 +1,5 @@
-// The texts of the tool's log that the simulator understands, in one table. A test compares it with
-// the tool's sources.
+// Finds the meaning of the texts in the tool's log. A table in log_lines.cpp has all texts that the
+// simulator understands. A test compares the table with the tool's sources.
 #pragma once
 
 #include <cstdint>
@@ -48,7 +48,7 @@ enum class LogMeaning {
   kLibraryRefused,
   kLibraryVanished,
   kErrorNumber,
-  // The key.
+  // Reasons why a key is not registered.
   kKeyOfRefusedPackage,
   kNoPathOfJar,
   kRegistrationFailed

@@ -7,11 +7,11 @@
 
 namespace simulator {
 
-// Reserves the descriptors of closed standard streams, so that no file of this program gets one.
-// Returns true if there was a standard input. Programs that this process starts find the streams as
-// they were. This program also contains code of the tool. Afterwards only std::cout writes to
-// standard output, and the lines that the tool's code prints in this process are discarded. Call it
-// before anything is printed.
+// Reserves the descriptors of closed standard streams, so that no file of this program gets such a
+// descriptor. Returns true if there was a standard input. Programs that this process starts find
+// the streams as they were. After the call, only std::cout writes to standard output. This program
+// also contains code of the tool, and the lines that this code prints are discarded. Call it before
+// anything is printed.
 bool KeepStandardStreams();
 
 // After this call, SIGINT, SIGTERM, SIGHUP, SIGQUIT and SIGPIPE do not end the process before it

@@ -165,8 +165,9 @@ void Reader::ReadVerify(const json& event) {
 }
 
 // True if the kernel is asked about the file itself. While the tool signs libraries or the file,
-// the step decides. At other times the tool makes no request to the kernel, but another program
-// (--tool) may. The path then decides, and an empty path counts as the file itself.
+// the step decides. At other times the tool makes no request to the kernel, but a program other
+// than the tool (--tool) can make one. The path then decides, and an empty path counts as the file
+// itself.
 bool Reader::IsOwn(const std::string& path) const {
   if (step_ == Step::kLibraries || step_ == Step::kFile) return step_ == Step::kFile;
   return path.empty() || path == record_.PathForTool();

@@ -1,5 +1,6 @@
-// A run of the tool: its events, sorted by the file to which each belongs. TakeApart fills a
-// RunRecord from the journal's events, except the last members, which Simulator::Run fills.
+// A run of the tool for one file: its events, and what they report about the file, its libraries
+// and its key. TakeApart fills a RunRecord from the journal's events, except the members from
+// `failure` on, which the journal does not have.
 #pragma once
 
 #include <cstdint>
@@ -24,7 +25,7 @@ struct Attempt {
     kVanished,     // a library that could not be opened again after its check
   };
 
-  std::string path;  // from the log or the kernel; may be empty
+  std::string path;  // from the log or the kernel; can be empty
   Outcome outcome = Outcome::kBegun;
   int64_t error = 0;                      // the errno of the kernel's refusal or of opening
   std::string payload;                    // the bytes that the kernel got, in hexadecimal
@@ -59,10 +60,10 @@ struct RunRecord {
   Events events;  // all events, in order
   std::string file;
   std::string path;
-  std::string installed;  // <install>/base.apk if Installation laid out the package; else empty
+  std::string installed;  // the copy that Installation made: <install>/base.apk; empty: none
   bool is_silent = true;  // the journal has no event of the tool before its exit
 
-  std::vector<LogLine> opening_errors;  // before the first step
+  std::vector<LogLine> opening_errors;  // logged before the tool began to sign
   bool is_dex_refused = false;
   LogMeaning dex_why = LogMeaning::kUnknown;  // the first error logged before the refusal, if any
   std::vector<Attempt> libraries;             // in order
@@ -87,11 +88,10 @@ struct RunRecord {
   ToolIdentity tool;
   bool has_standard_input = true;  // the tool was started with a standard input
   bool has_no_packages = false;    // a directory without packages; the tool was not run
-  // Library entries of a package that was laid out. First those of Arm ABIs that were not chosen,
-  // then those whose names no installer accepts, then those that cannot be extracted.
-  std::set<std::string> of_other_processors;
-  std::vector<std::string> not_laid_out;
-  std::vector<std::string> not_extracted;
+  // Library entries that Installation did not extract:
+  std::set<std::string> of_other_processors;  // entries of Arm ABIs that were not chosen
+  std::vector<std::string> not_laid_out;      // entries whose names no installer accepts
+  std::vector<std::string> not_extracted;     // entries that cannot be extracted
 
   // The path that the tool got.
   const std::string& PathForTool() const { return installed.empty() ? path : installed; }

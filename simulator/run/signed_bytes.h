@@ -1,10 +1,10 @@
 // The bytes that the phone's kernel has signed so far. A file with these bytes is trusted, under
 // any name.
 //
-// With a directory, SHA-256 digests are remembered across runs. Each digest is the name of a file
-// in the directory. That file contains the path of the signed file, for human readers. Without a
-// directory, signed files are remembered as long as this object lives. They are digested only if a
-// file of the same length is looked up.
+// With a directory (--state), SHA-256 digests are remembered across runs. Each digest is the name
+// of a file in the directory. That file contains the path of the signed file, for human readers.
+// Without a directory, signed files are remembered as long as this object lives. They are digested
+// only if a file of the same length is looked up.
 #pragma once
 
 #include <sys/stat.h>
@@ -20,20 +20,21 @@ namespace simulator {
 class SignedBytes {
  public:
   // `directory` is created if it does not exist; empty: nothing is kept beyond this object. If
-  // `shares` is false, added files are trusted only in later runs, so that the order of the files
-  // of this run does not matter. In this case several threads may use the object.
+  // `shares` is false, added files are not trusted in this run, so that the order of its files does
+  // not matter. In this case several threads may use the object.
   SignedBytes(std::string directory, bool shares)
       : directory_(std::move(directory)), shares_(shares) {}
 
   // Reads the digests in the directory. Returns false if the directory cannot be used.
   bool Load();
 
-  // True if the file at `path` has bytes that were signed. False for a file that is not regular, or
-  // that cannot be read before the deadline.
+  // True if the file at `path` has bytes that were signed. False for a file that is not regular.
+  // Also false if the file must be digested, but cannot be read before the deadline.
   bool Holds(const std::string& path, const Deadline& deadline);
 
-  // Remembers the present bytes of the file at `path`. Returns false if the deadline passed, or if
-  // the digest cannot be written. Returns true even if the file is gone or cannot be read.
+  // Remembers the present bytes of the file at `path`. Returns false if the file cannot be digested
+  // before the deadline, or if the digest cannot be written. Exception: returns true if the file is
+  // gone or cannot be read.
   bool Add(const std::string& path, const Deadline& deadline);
 
  private:

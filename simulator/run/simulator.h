@@ -25,8 +25,8 @@ struct RunOptions {
   InstalledAbi abi = InstalledAbi::kPreferred;  // whose libraries are extracted
   unsigned jobs = 1;                            // how many files at a time
   std::string tool;                             // the program that is run
-  bool is_own_tool = false;                     // it is the tool beside this program
-  std::vector<std::string> runner;              // words before the tool, such as an emulator's
+  bool is_own_tool = false;                     // `tool` is the one beside this program
+  std::vector<std::string> runner;              // put before the tool: an emulator with its options
   double timeout = 30;                          // seconds, for each file
 };
 
@@ -47,7 +47,8 @@ class Simulator {
   std::optional<std::string> Prepare();
 
   // Runs the tool for `file` if its state is kToRun. Otherwise the result has only the reason why
-  // the tool was not run. Several threads may call this function if `jobs` is more than 1.
+  // the tool was not run. If `jobs` is more than 1, several threads may call this function at the
+  // same time.
   FileRun Run(const ListedFile& file);
 
  private:

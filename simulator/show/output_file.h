@@ -1,5 +1,6 @@
 // An output file that the command line names: the journal, the page, or a report for another
-// program. An existing regular file is replaced only if it is empty or of the same kind.
+// program. An existing regular file is replaced only if it is empty, or if it begins like a file of
+// the kind that replaces it.
 #pragma once
 
 #include <optional>

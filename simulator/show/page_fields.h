@@ -36,9 +36,10 @@ kainjow::mustache::list OneIf(bool condition);
 // The number in groups of three digits, such as "1,234,567".
 std::string Grouped(uint64_t number);
 
-// Sets the sections of a list: "NAME_shown" if there are lines, `name` with the fields that `make`
-// returns for each of the first kMostPageLines lines, and "NAME_more" if there are more lines. Sets
-// "NAME_count" to the number of all lines. `remark` follows the number of lines that are left out.
+// Sets the sections of a list, where NAME is `name`: "NAME_shown" if there are lines, "NAME" with
+// the fields that `make` returns for each of the first kMostPageLines lines, and "NAME_more" if
+// there are more lines. Sets "NAME_count" to the number of all lines. `remark` follows the number
+// of lines that are left out.
 template <typename Lines, typename Make>
 void AddLines(const std::string& name, const Lines& lines, const std::string& remark, Make make,
               kainjow::mustache::data* file) {

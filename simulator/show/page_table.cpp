@@ -16,7 +16,7 @@ using kainjow::mustache::list;
 using kainjow::mustache::object;
 
 // From the worst to the best. Nothing is known about a file with the first verdict. Nothing is
-// wrong with a file with the last one.
+// wrong with a file with the last verdict.
 constexpr Verdict kWorstFirst[] = {
     Verdict::kNotSimulated,  Verdict::kNotLookedAt,    Verdict::kRefused,
     Verdict::kNotTrustedJar, Verdict::kNotInstallable, Verdict::kNotAccepted,
@@ -70,7 +70,8 @@ void PageTable::Fill(data* page) const {
   page->set("choice", OneIf(choices.size() > 1));
 }
 
-// One choice for each verdict in the table, the worst first, and one for the files with warnings.
+// One choice of rows for each verdict in the table, the worst first, and one for the files with
+// warnings.
 list PageTable::Choices() const {
   const auto count = [this](const auto& is_chosen) {
     return static_cast<size_t>(std::count_if(rows_.begin(), rows_.end(), is_chosen));
@@ -119,8 +120,8 @@ size_t RankOf(Verdict verdict) {
                              std::begin(kWorstFirst));
 }
 
-// Starts with the decisive reason. If there is none, starts with the other signer for whom phones
-// install the package, if there is one. The alarms follow.
+// Starts with the decisive reason. If nothing was refused, starts with the signer for whom phones
+// install the package, if that is not the JAR signer. The alarms follow.
 std::string ReasonText(const Report& report) {
   std::vector<std::string> facts = {DecisiveReason(report)};
   if (facts[0].empty()) facts[0] = OtherOwnerText(report);

@@ -29,23 +29,24 @@ struct ShowOptions {
 
 class Presenter {
  public:
-  // `file_count`: the number of files that will be shown.
+  // `file_count`: the number of files to show.
   Presenter(const ShowOptions& options, size_t file_count);
 
-  // Returns a reason not to begin if an output would overwrite a file of the user, or one of
-  // `inputs`, or if two outputs are the same file. Else none.
+  // Returns a reason not to begin if OutputFile::Objection has one for an output, or if two outputs
+  // are the same file. Else none.
   std::optional<std::string> Objection(const std::vector<std::string>& inputs) const;
   // Opens the outputs. Returns none, or why one of them cannot be written: then call GiveUp.
   std::optional<std::string> Begin();
-  // `journal`: the lines of the run, from "start" to "exit".
+  // `journal`: the lines of the run, without the verdict.
   void Show(const Report& report, const std::string& journal);
   // Shows the output of a run of apktoolkit-verify. If the run could not be simulated, `report` has
   // the reason.
   void ShowAnswer(const RunRecord& run, const Report& report, const std::string& journal);
   void ShowProgress(const std::string& file, int seconds);
   // Writes the summary, the page and the reports. `files` are all files of the command line. If the
-  // run was interrupted, those that were not shown are errors in the reports for other programs.
-  // Returns the highest status of all files, or at least kCannotSimulate if an output failed.
+  // run was interrupted, the files that were not shown are errors in the reports for other
+  // programs. Returns the highest status of all files, or at least kCannotSimulate if an output
+  // failed.
   int Finish(const std::vector<std::string>& files);
   // Called instead of Show and Finish if no file can be simulated because of `problem`. The page
   // and the reports then have an error for each file. Returns the exit status.

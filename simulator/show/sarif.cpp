@@ -39,8 +39,8 @@ void Sarif::Add(const Report& report) {
   const Json location = {{"physicalLocation",
                           {{"artifactLocation", {{"uri", UriOf(report.file)}, {"index", index}}}}}};
   // A refusal that follows from another refusal gets no result, because the result of that other
-  // refusal says what to fix. If the report has only refusals that follow from others, each of them
-  // gets a result, so that every refused file has at least one.
+  // refusal says what to fix. The exception is a report that has only such refusals. Each of them
+  // then gets a result, so that every refused file has at least one.
   const bool has_origin =
       std::any_of(report.items.begin(), report.items.end(),
                   [](const Item& item) { return IsRefused(item) && !Follows(item); });

@@ -1,9 +1,9 @@
 // The report of a run for programs that read results of static analysis: one SARIF log (OASIS
 // Static Analysis Results Interchange Format, version 2.1.0). Each refused item is a result of
-// level "error", unless it follows from another refusal. Each warning is a result of level
-// "warning". The rules are the causes (simulator/verdict/causes.h). A file that was not looked at,
-// or not simulated, is a notification of level "error", and the run then counts as not successful.
-// All texts from a file are escaped.
+// level "error", unless it only follows from another refused item of the report. Each warning is a
+// result of level "warning". The rules are the causes (simulator/verdict/causes.h). A file that was
+// not looked at, or not simulated, is a notification of level "error", and the run then counts as
+// not successful. All texts from a file are escaped.
 #pragma once
 
 #include <map>

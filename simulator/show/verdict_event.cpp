@@ -67,8 +67,9 @@ std::string SignerJson(const std::string& scheme, const CertificateFacts& signer
   return Object(members);
 }
 
-// For the JAR signer ("v1"), the report's key has precedence. It is the key that the kernel got or,
-// if it got none, the key that the tool reads. libcrypto may find another key in the certificate.
+// For the JAR signer ("v1"), the report's key has precedence over the key that libcrypto finds in
+// the certificate. The report's key is the key that the kernel got or, if the kernel got none, the
+// key that the tool reads.
 std::string SignersJson(const Report& report) {
   std::vector<std::string> signers;
   if (report.signer || report.key) {

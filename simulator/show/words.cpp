@@ -6,7 +6,7 @@ namespace simulator {
 
 namespace {
 
-// In the order of the verdicts.
+// In the order of the values of Verdict, which are the indices of this table.
 constexpr VerdictWords kVerdicts[] = {
     {"signed", "SIGNED", "signed", "signed", Mood::kGood},
     {"other-signer", "SIGNED, OTHER SIGNER", "signed for another signer",

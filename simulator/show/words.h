@@ -29,8 +29,8 @@ const VerdictWords& WordsOf(Verdict verdict);
 const char* MoodCode(Mood mood);
 
 // Returns a text such as "3 files: 1 signed, 2 refused". For an interrupted run, `unseen` is the
-// number of files that were not reached. The text then also reports the interruption and this
-// number.
+// number of files that were not reached. The text then also reports the interruption, and this
+// number if it is not 0.
 std::string Summary(const std::vector<Verdict>& verdicts, std::optional<size_t> unseen = {});
 
 // The package's name, its JAR signer and key, and the text of OtherOwnerText. `ellipsis` replaces

@@ -142,8 +142,8 @@ CertificateFacts JarSigner(const Report& report) {
   return signer;
 }
 
-// The signers of the newest scheme that phones of these levels verify. Empty if these phones refuse
-// the package.
+// The signers of the newest scheme that phones of the range's API levels verify. Empty if these
+// phones refuse the package.
 std::vector<const CertificateFacts*> NewestSigners(const RangeJudgement& range) {
   std::vector<const CertificateFacts*> signers;
   if (!range.is_verified) return signers;

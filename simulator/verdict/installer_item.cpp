@@ -86,7 +86,8 @@ std::string LevelsText(const std::vector<RangeJudgement>& ranges, bool is_verifi
 }
 
 // Sentences for the most frequent faults. "%s" is replaced by the issue's parameter with the index
-// `parameter`, such as the entry's name. All other faults are reported in apksig's own sentence.
+// `parameter`, such as the entry's name. All other faults, and faults without this parameter, are
+// reported in apksig's own sentence.
 constexpr struct {
   const char* issue;
   size_t parameter;

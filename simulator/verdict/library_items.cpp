@@ -50,7 +50,7 @@ Reason WhyKernelDidNotSign(const Attempt& attempt) {
   if (attempt.outcome != Attempt::Outcome::kNotAsked) return {};
   if (!attempt.integrity) return {&cause::kIntegrityMissing, ""};
   unsigned value = 0;
-  // The tool reads the value in the same way.
+  // The tool also reads the value with the format %x.
   if (sscanf(attempt.integrity->c_str(), "%x", &value) != 1) {
     return {&cause::kIntegrityUnreadable, *attempt.integrity};
   }
@@ -59,9 +59,9 @@ Reason WhyKernelDidNotSign(const Attempt& attempt) {
 
 namespace {
 
-// Pairs each library with its attempt. The tool handles the libraries in the order of the archive,
-// and `present` has that order. If attempts are left over, the pairs cannot be right. The result
-// then has one library for each attempt, with only a path.
+// Pairs each library with its attempt. The tool handles the libraries in the order of the zip
+// library's iteration, and `present` has that order. If attempts are left over, the pairs cannot be
+// right. The result then has one library for each attempt, with only a path.
 std::vector<Library> MatchAttempts(const RunRecord& run, const std::vector<LibraryFacts>& present) {
   std::vector<Library> libraries;
   auto attempt = run.libraries.begin();
@@ -137,7 +137,7 @@ Reason WhyNotThere(const LibraryFacts& library, const RunRecord& run, const Pack
     return {&cause::kLibraryNotOpened, DescribeErrno(error)};
   }
   if (facts.manifest.extracts_libraries == false) return {&cause::kLibraryInPackage, ""};
-  // Installers use only lib/ABI/NAME, such as lib/arm64/NAME.
+  // Installers extract no library to a deeper path than lib/arm64/NAME.
   if (std::count(library.place.begin(), library.place.end(), '/') > 2) {
     return {&cause::kLibraryInSubdirectory, library.place};
   }

@@ -26,7 +26,8 @@ std::string FirstSignatureFile(const JarSignatureFacts& jar);
 
 }  // namespace
 
-// Looks for reasons in the order in which the tool checks.
+// An encrypted entry is the reason even if the log has an error. Otherwise the first log line that
+// names a failed check decides. The log has the checks in the order in which the tool makes them.
 Reason WhyRefused(const RunRecord& run, const PackageFacts& facts) {
   const Lines& errors = run.opening_errors;
   const JarSignatureFacts& jar = facts.jar;
@@ -169,7 +170,7 @@ Reason WhyManifestRefused(const Lines& errors, const JarSignatureFacts& jar) {
   return {has_none ? &cause::kManifestDigest : &cause::kManifestChanged, ""};
 }
 
-// The tool logs nothing about a manifest or a signature file that is missing or cannot be
+// The tool logs nothing if META-INF/MANIFEST.MF or the signature file is missing or cannot be
 // extracted.
 Reason WhySilentlyRefused(const PackageFacts& facts) {
   const JarSignatureFacts& jar = facts.jar;

@@ -18,7 +18,8 @@ Reason WhyRefused(const RunRecord& run, const PackageFacts& facts);
 Reason WhyNotLookedAt(const RunRecord& run, const PackageFacts& facts);
 
 // Why an archive without AndroidManifest.xml is probably not meant to be a JAR: it is an app bundle
-// or a set of packages, or has parts of a package. A null cause if it may be a JAR.
+// or a set of packages, or has parts of a package. A null cause if the archive has none of these
+// signs.
 Reason WhyTakenForAJar(const PackageFacts& facts);
 
 // Why the tool refused a file, if an entry that the tool reads is encrypted: an entry of the JAR
@@ -34,7 +35,8 @@ Reason WhyKernelDidNotSign(const Attempt& attempt);
 void AddLibraryItems(const RunRecord& run, const PackageFacts& facts, const JudgeOptions& options,
                      std::vector<Item>* items);
 
-// Adds an item if phones of some levels do not install the package, or if the verifier gave up.
+// Adds an item if phones of some API levels do not install the package, or if the installer's
+// verifier gave up.
 void AddInstallerItem(const Judgement& judgement, const JudgeOptions& options,
                       std::vector<Item>* items);
 

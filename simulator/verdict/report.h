@@ -1,5 +1,6 @@
-// The result for one file. The text, the journal's last event and all other forms are made from
-// it alone. Plain data, computed once by MakeReport (make_report.h).
+// The result for one file. All outputs about the file, such as the text and the journal's last
+// event, are made from it. Plain data, computed by MakeReport (make_report.h). Gate (gate.h) can
+// then add refusals.
 #pragma once
 
 #include <cstdint>
@@ -20,7 +21,7 @@ enum class Verdict {
   kOtherSigner,  // signed, but phones install it for another signer than the kernel's
   kTrustedJar,
   kPartlySigned,
-  kNotInstallable,  // something was signed, but phones do not install the package
+  kNotInstallable,  // something was signed, but not all phones install the package
   kNotAccepted,     // everything was signed, but a further demand is not met (gate.h)
   kRefused,
   kNotTrustedJar,
@@ -64,7 +65,7 @@ struct Item {
   std::string entry;  // of a library: its entry in the package
   ItemState state;
   Reason reason;             // a null cause if the state is kDone
-  bool is_verified = false;  // its bytes were compared with the manifest, and match
+  bool is_verified = false;  // a library: its bytes match the manifest; a package: it verified
 };
 
 // The key of the JAR signature, as the kernel and the tool know it.
@@ -130,7 +131,7 @@ struct Report {
 // verdict, else the first refused item. Null if nothing was refused.
 const Item* DecisiveItem(const Report& report);
 
-// The newest phones that install the package may install it for a signer other than the JAR signer.
+// The newest phones that install the package can install it for a signer other than the JAR signer.
 // Returns such a signer, or null if there is none. Reads only the signer and the key of the report.
 const CertificateFacts* OtherSigner(const Judgement& judgement, const Report& report);
 

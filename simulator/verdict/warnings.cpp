@@ -53,7 +53,7 @@ bool IsJarSigner(const PublicKey& key, const Report& report) {
 
 namespace {
 
-// Warns if other programs may find another signer or package name than the tool does.
+// Warns if other programs can find a signer or package name that differs from the tool's.
 void WarnOfTwoFaces(const PackageFacts& facts, const Report& report, Reasons* warnings) {
   const JarSignatureFacts& jar = facts.jar;
   if (report.key && jar.certificate) {

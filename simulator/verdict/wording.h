@@ -21,7 +21,8 @@ inline std::string Joined(const std::vector<std::string>& words) {
   return text;
 }
 
-// The number of entries, and the name of the first one: "3 entries: a, ...".
+// The number of entries, and the name of the first one: "3 entries: a, ...". `names` must not be
+// empty.
 inline std::string CountedNames(const std::vector<std::string>& names) {
   return Counted(names.size(), "entry", "entries") + ": " + names[0] +
          (names.size() > 1 ? ", ..." : "");
@@ -35,8 +36,8 @@ std::string LevelText(const LevelRange& levels);
 // apksig (the platform's verifier) was asked install the package.
 std::string TakersText(const Judgement& judgement);
 
-// The name of the JAR signer's key, such as "RSA-2048": of the report's key, or else of the
-// certificate's key. Empty if the report has neither.
+// The algorithm and size of the JAR signer's key, such as "RSA-2048". They come from report.key, or
+// from the certificate if report.key is not set. Empty if the report has neither of them.
 inline std::string KeyName(const Report& report) {
   const PublicKey shown = report.signer ? report.signer->key : PublicKey();
   const std::string algorithm = report.key ? "RSA" : shown.algorithm;
