@@ -292,7 +292,7 @@ TEST(AndroidManifestSurrogates, DoNotMakeAShorterNameMatch) {
   EXPECT_EQ(Read(xml), (Facts{"", false}));
 }
 
-// A name with more than 16 unpaired surrogates does not match. Without this limit, each comparison
+// A text with more than 16 unpaired surrogates matches no name. Without this limit, each comparison
 // could read all text of a hostile document.
 TEST(AndroidManifestSurrogates, PreventAMatchIfThereAreMoreThan16) {
   for (const size_t count : {16, 17}) {

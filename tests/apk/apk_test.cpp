@@ -180,7 +180,7 @@ TEST(ApkInit, DescriptorOneFromItsOwnOpenIsUsed) {
   EXPECT_TRUE(apk.IsGoodZip());
 }
 
-// A caller that passes descriptor 0 knows which file it is.
+// Descriptor 0 counts as a failure only if Init opened the file itself.
 TEST(ApkInit, DescriptorZeroThatWasGivenIsUsed) {
   DiskFile file(MakePackage(WithoutDex()).Build());
   LogCapture log;
@@ -293,8 +293,8 @@ TEST(ApkInit, PackageWithoutManifestIsNotGoodAndLogsNothing) {
   EXPECT_EQ(StateOf(open.apk), (State{true, true, false, true}));
 }
 
-// META-INF/MANIFEST.MF is read first. If it is missing, nothing is logged about the signature file
-// and the signature block.
+// META-INF/MANIFEST.MF is read before the signature file and the signature block. If it is missing,
+// nothing is logged about these two entries.
 TEST(ApkInit, PackageWithoutManifestAndBlockLogsNothing) {
   Package package = MakePackage(WithoutDex());
   package.Remove(kManifestName);
@@ -355,7 +355,7 @@ TEST(ApkInit, AndroidManifestThatIsNotCompiledXmlIsReported) {
   EXPECT_EQ(StateOf(open.apk), (State{true, true, false, true}));
 }
 
-// AndroidManifest.xml is read only after META-INF/MANIFEST.MF was loaded.
+// AndroidManifest.xml is parsed only after META-INF/MANIFEST.MF was loaded.
 TEST(ApkInit, AndroidManifestIsNotReadIfTheManifestCannotBeParsed) {
   PackageOptions options = WithoutDexListedBy("Key:x");
   options.secure_storage = true;

@@ -75,7 +75,7 @@ TEST(EntryDigests, LastSectionWithTheNameCounts) {
   EXPECT_EQ("SHA-256-Digest 3", unordered.Of("b"));
 }
 
-// A sort that is not stable may keep a few equal names in order by chance, but not so many.
+// An unstable sort can keep a few equal names in order by chance, but not 50.
 TEST(EntryDigests, LastOf50SectionsWithTheNameCounts) {
   std::string sections = Section("z", "0");
   for (int i = 1; i <= 100; ++i) sections += Section(i % 2 == 0 ? "a" : "b", std::to_string(i));

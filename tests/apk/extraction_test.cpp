@@ -11,8 +11,8 @@
 
 using namespace ApkTools;
 
-// The linker redirects the tool's calls of mmap to the function below, including the call that
-// checks whether memory is available.
+// The linker redirects the tool's calls of mmap to __wrap_mmap, including the call that checks
+// whether memory is available.
 static bool memory_is_short = false;
 
 extern "C" void* __real_mmap(void* address, size_t size, int protection, int flags, int fd,
@@ -85,8 +85,8 @@ TEST(Extraction, StoredEntryMustBeAsLongAsItsData) {
   EXPECT_TRUE(IsPlausibleLength(entry));
 }
 
-// An entry of zeros longer than the trusted length. It is made once, because the compression takes
-// time.
+// An entry of zeros. Its length is above kZipTrustedLength, even if the entry declares one byte
+// less. It is made once, because the compression takes time.
 constexpr uint32_t kLongLength = kZipTrustedLength + 2;
 const ZipItem& LongItem() {
   static const ZipItem item = [] {

@@ -1,6 +1,7 @@
-// Counts the comparisons that the readers of a JAR manifest make, and changes the direction in
-// which they copy. The results of the readers show neither. The linker redirects all calls of
-// memcmp, bcmp and memcpy in this program to the functions below.
+// Counts the comparisons that the readers of a JAR manifest make, because their results do not show
+// this number. Also makes memcpy copy backwards, so that a reader that calls memcpy for overlapping
+// pieces fails. The linker redirects all calls of memcmp, bcmp and memcpy in this program to the
+// functions below.
 #include <gtest/gtest.h>
 
 #include <algorithm>
@@ -17,8 +18,8 @@
 namespace {
 
 size_t comparisons = 0;
-// True: copies begin at the last byte. memcpy may begin there, because its source and its target do
-// not overlap.
+// True: copies begin at the last byte. The C standard permits this for memcpy, because its source
+// and its target must not overlap.
 bool copies_backwards = false;
 
 }  // namespace
@@ -68,10 +69,10 @@ std::vector<std::string> ShortNames(size_t count) {
   return names;
 }
 
-// A sort compares each name with about log2(4096) = 12 others. Before its end, the section is
-// sorted again only after its number of names has more than doubled. At its end, it is sorted once
-// more. Here all sorts together make about twice the comparisons of that last sort. This test
-// allows twice that number.
+// A sort compares each name with about log2(4096) = 12 others. Before the end of the section, its
+// names are sorted again only after their number has more than doubled. At the end of the section,
+// they are sorted once more. Here all sorts together make about twice the comparisons of that last
+// sort. This test allows twice that number.
 TEST_F(JarManifestCalls, ShuffledNamesNeed12To48ComparisonsEach) {
   std::vector<std::string> names = ShortNames(4096);
   std::shuffle(names.begin(), names.end(), std::mt19937(1));
@@ -86,7 +87,8 @@ TEST_F(JarManifestCalls, NamesInOrderNeedFewerThan4ComparisonsEach) {
   EXPECT_LT(count, 4 * 4096u);
 }
 
-// A few repeated names are sorted again only after the text has advanced by their total length.
+// Each sort drops the repeated names. The next sort waits until the text has advanced by more than
+// the total length of the names that are left.
 TEST_F(JarManifestCalls, RepeatedNamesNeedFewerThan48ComparisonsEach) {
   std::vector<std::string> names;
   for (int round = 0; round < 64; ++round) {

@@ -1,6 +1,6 @@
-// Counts calls of the platform's library, because results do not show the number of calls. The
-// linker redirects the tool's calls to the functions below (CMakeLists.txt has the mangled names),
-// which call the library. A hostile document can make each call expensive.
+// Counts calls of the platform's library. A hostile document can make each call expensive, and the
+// results do not show the number of calls. The linker redirects the tool's calls to the functions
+// below, which count them and call the library. CMakeLists.txt has the mangled names.
 #include <androidfw/ResourceTypes.h>
 #include <gtest/gtest.h>
 #include <utils/String8.h>

@@ -429,7 +429,7 @@ class ManifestWriter {
     std::string text = Line("Manifest-Version", "1.0") + Attributes() + "\r\n";
     const uint32_t sections = Pick(20);
     for (uint32_t i = 0; i < sections; ++i) {
-      // A continuation line may split a character of two or three bytes.
+      // A continuation line can split a character of two or three bytes.
       const std::string name = "assets/\xC3\xA4\xE2\x82\xAC" + std::to_string(i) + Value();
       text += Line("Name", name) + Attributes() + "\r\n";
     }

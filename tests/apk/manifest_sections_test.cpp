@@ -128,10 +128,10 @@ TEST(ManifestSection, LastOfEqualNamesCounts) {
   }
 }
 
-// Two long names that differ only in their last byte come before very many short ones. The long
-// names are unreadable while the short ones are added. The addition of the second long name
-// compares them once. They must not be compared again before the text has advanced, from the start
-// of the second name, by the length of both.
+// Two long names that differ only in their last byte come before very many short names. The
+// addition of the second long name compares the long names once. While the short names are added,
+// the long names are unreadable, so a comparison would crash. The long names must not be compared
+// again before the text has advanced, from the start of the second name, by the length of both.
 TEST(ManifestSection, LongNamesAreNotComparedAgainForEachShortName) {
   constexpr uint32_t kLength = 1 << 20;
   constexpr size_t kAll = 3 * kLength;

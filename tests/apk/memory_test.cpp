@@ -79,8 +79,8 @@ TEST(ApkMemory, ShortEntryThatDeclaresGigabytesTakesLittleMemory) {
   EXPECT_LT(growth, kLittleMemory);
 }
 
-// The growth of the peak memory for a package whose signature file is this text. The text
-// compresses well.
+// The growth of the peak memory for a package whose signature file is `text`. The text must
+// compress well, so that the package is small.
 long GrowthWithSignatureFile(const std::string& text) {
   Package package = MakePackage(WithoutDex());
   ZipItem& signature_file = package.Item("META-INF/CERT.SF");

@@ -1,4 +1,4 @@
-// The log records of opening a package.
+// The log records of opening and verifying a package.
 #pragma once
 
 #include <gtest/gtest.h>

@@ -277,7 +277,7 @@ class VerifyData : public testing::Test {
 
   LogCapture log_;
   Apk apk_;
-  // FIPS 180-4: the digests of "abc".
+  // The digests of "abc" (FIPS 180-2, appendices A.1 and B.1).
   const Bytes sha1_ = FromHex("a9993e36 4706816a ba3e2571 7850c26c 9cd0d89d");
   const Bytes sha256_ =
       FromHex("ba7816bf 8f01cfea 414140de 5dae2223 b00361a3 96177a9c b410ff61 f20015ad");

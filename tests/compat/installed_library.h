@@ -1,7 +1,7 @@
-// The functions of the installed zip library, under names that conflict neither with its header nor
-// with the header of API level 29 and earlier. zipstring_library.cpp includes the earlier header,
-// and installed_library.cpp includes the library's own header. Result codes, lifetimes and handles
-// are those of the library.
+// The functions of the installed zip library, under names that are not in its own header and not in
+// the older header (include/ziparchive, API level 27). zipstring_library.cpp includes the older
+// header, and installed_library.cpp includes the library's own header. Result codes, lifetimes and
+// handles are those of the library.
 #pragma once
 
 #include <sys/types.h>

@@ -10,8 +10,8 @@ namespace {
 
 constexpr int kRounds = 150000;
 
-// Half of the dividends are random. The others are next to a multiple of the divisor, where the
-// estimate of a quotient digit is most often wrong.
+// About half of the dividends are random. The others are equal to or next to a multiple of the
+// divisor, where the estimate of a quotient digit is most often wrong.
 TEST(MpiModMpi, IsTheNonNegativeRemainder) {
   Operands operands;
   for (int round = 0; round < kRounds; ++round) {
@@ -64,7 +64,8 @@ TEST(MpiModMpi, IgnoresTheDivisorsSign) {
   EXPECT_EQ(1, Value(R));  // 2^32 = 4 mod 7, 5 * 4 = 6 mod 7
 }
 
-// A shift that leaves the divisor's highest bit clear would make the digit's estimate wrap here.
+// A shift that leaves the divisor's highest bit clear would make the estimate of a quotient digit
+// wrap here.
 TEST(MpiModMpi, IsRightForADivisorWithATopLimbOf31Bits) {
   Number A({0x8712b8bc, 0xffffffff, 0x4000fffe});
   Number B({0x00000001, 0x4000ffff});

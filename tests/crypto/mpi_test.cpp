@@ -1,5 +1,6 @@
-// The integers, compared with GMP. Each operation gets at least 100,000 operands. Many of them are
-// made of limbs that cause carries.
+// The big integers, compared with GMP. Each operation that computes a value gets kRounds random
+// operands, except mpi_mod_mpi, mpi_montmul and mpi_pow_mod, which other files test. Many operands
+// are made of limbs that cause carries.
 #include "crypto/mpi.h"
 
 #include <gtest/gtest.h>

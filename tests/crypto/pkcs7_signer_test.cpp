@@ -236,9 +236,9 @@ TEST(ProcessCertDamagedBlock, EveryTruncationIsRefused) {
 }
 
 TEST(ProcessCertDamagedBlock, EveryTruncationOfABlockOfIndefiniteLengthsStaysInside) {
-  // By its length, the SignerInfo ends with the digestAlgorithm. The encryptedDigest may end beyond
-  // the block. A block that is cut inside the encryptedDigest can therefore be accepted, so this
-  // test does not check the result.
+  // By its length, the SignerInfo ends with the digestAlgorithm. The tool accepts an
+  // encryptedDigest that ends beyond the block. A block that is cut inside the encryptedDigest can
+  // therefore be accepted, so this test does not check the result.
   const Bytes whole = BlockEndingInSigners(Concat({
       FromHex("31 80 30 14 02 01 01 30 80"),
       Sha256Algorithm(),

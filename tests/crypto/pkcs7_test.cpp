@@ -294,8 +294,8 @@ TEST(ProcessCertKey, ExponentElementMayNotBeLongerThanTheModulus) {
   EXPECT_EQ(processed.record.modulus_length, 4u);
 }
 
-// With its leading zero, the modulus has five bytes. The record leaves out the zero, but the
-// comparison counts it.
+// With its leading zero, the modulus has five bytes. The record leaves out the zero, but the limit
+// for the exponent's element counts it.
 TEST(ProcessCertKey, ExponentMayBeAsLongAsTheModulusWithItsLeadingZero) {
   const ProcessedBlock processed(WithRsaKey(Concat({{0x00}, Bytes(4, 0x77)}), {1, 0, 1}));
   EXPECT_EQ(processed.result, 0);

@@ -25,7 +25,7 @@ inline constexpr char kNoAlgorithm[] =
 
 inline const Bytes kSignatureFile = ToBytes("Signature-Version: 1.0\r\n\r\n");
 
-// The block ends where memory ends, so that reading past it crashes.
+// The block ends where readable memory ends, so that reading past the block crashes.
 struct ProcessedBlock {
   explicit ProcessedBlock(const Bytes& block) : bytes(block) {
     testing::internal::CaptureStdout();
@@ -71,8 +71,8 @@ inline SignatureBlock WithRsaKey(const Bytes& modulus, const Bytes& exponent) {
 }
 
 // A block that ends with these bytes, which start with the [0] of the certificates. The enclosing
-// elements have the indefinite form, which reads as length 0. They therefore never end beyond the
-// block.
+// elements have the indefinite form, which processCert reads as length 0. They therefore never end
+// beyond the block.
 inline Bytes BlockEndingIn(const Bytes& certificates) {
   return Concat({FromHex("30 80"), der::Oid("1.2.840.113549.1.7.2"),
                  FromHex("a0 80 30 80 02 01 01 31 00 30 00"), certificates});

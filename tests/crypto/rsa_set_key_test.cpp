@@ -83,7 +83,7 @@ TEST(RsaSetKey, ReadsTheExponentValueAsASignedNumber) {
   }
 }
 
-// Memory ends right after the last byte of the exponent that may be read.
+// The readable memory ends right after the 128 bytes of the exponent.
 TEST(RsaSetKey, ReadsExactlyAsManyBytesOfTheExponentAsTheModulusHas) {
   const FixedKey key("rsa-1024");
   Bytes bytes(128, 0);

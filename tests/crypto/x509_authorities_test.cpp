@@ -27,7 +27,7 @@ std::vector<std::string> CertificateFiles() {
   return files;
 }
 
-// The output of the command. If the command fails, the output may be incomplete.
+// The output of the command. If the command fails, the output can be incomplete.
 std::string OutputOf(const std::string& command) {
   FILE* pipe = popen(command.c_str(), "r");
   if (pipe == nullptr) return "";

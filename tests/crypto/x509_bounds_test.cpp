@@ -117,9 +117,9 @@ TEST(X509TooLongElement, ElementsOfANameMayNotUseBytesAfterTheirContainer) {
   for (const Bytes& name : cases) EXPECT_EQ(ResultOf(WithSubject(name)), -12);
 }
 
-// In the first case, the second time does not end in "Z". In the second case, its last two
+// In the first case, the second time ends in "0", not in "Z". In the second case, its last two
 // characters are missing. The subject follows the times. It has 90 bytes of contents, so it starts
-// with 30 5a. As text, these bytes are "0Z", which would complete the time.
+// with 30 5a. As text, these bytes are "0Z", which would complete the time of the second case.
 TEST(X509TooLongElement, TimeIsMinus13) {
   Certificate certificate = WithSubject(Name({{kCommonName, std::string(79, 'x')}}));
   ASSERT_EQ(certificate.subject[0], '0');
@@ -144,7 +144,8 @@ TEST(X509TooLongElement, KeyIsMinus14) {
   EXPECT_EQ(ResultOf(certificate), -14);
 }
 
-// All elements are in the tbsCertificate, but not in the SEQUENCE that should contain them.
+// In each case, an element or its end follows the SEQUENCE that should contain it. All elements are
+// still in the tbsCertificate.
 TEST(X509TooLongElement, KeyAfterItsInfoIsMinus14) {
   const Bytes algorithm = AlgorithmIdentifier("1.2.3");
   const Bytes key = der::BitString({1, 2, 3});
@@ -252,7 +253,8 @@ TEST(X509TrailingBytes, LoneByteAfterTheKeyIsMinus5) {
   EXPECT_EQ(ResultOf(certificate), 0);
 }
 
-// Half of a header follows the last element that is read in each container.
+// Half of a header follows the last element that is read, in containers that the parser does not
+// read to the end.
 TEST(X509TrailingBytes, BytesAfterTheLastElementThatIsReadAreIgnored) {
   const Bytes rest = {0x30};
   const Bytes time = der::Element(der::kUtcTime, "200102030405Z");

@@ -7,9 +7,9 @@
 // Calls from the simulated phone's own libraries are passed on and not counted, except requests for
 // memory.
 //
-// The names are malloc, open, read, fopen, readlink, fgetxattr, fstatvfs and fcntl. A function with
-// several names (open, open64 and the checked __open_2) counts as one function. malloc, calloc and
-// realloc also count as one function.
+// The functions are malloc, open, read, fopen, readlink, fgetxattr, fstatvfs and fcntl. A function
+// with several names (open, open64 and the checked __open_2) counts as one function. malloc, calloc
+// and realloc also count as one function.
 #include <dlfcn.h>
 #include <fcntl.h>
 #include <signal.h>

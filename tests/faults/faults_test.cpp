@@ -224,9 +224,9 @@ bool IsAbort(const ToolEnd& ending) {
 }
 
 // Makes each request for memory fail, one per run. A run may end with an abort because a C++
-// container gets no memory. Its grants must be the first letters of `all`, and at least as many as
-// in each earlier run that aborted. In any other run, the tool and its libraries handle the missing
-// memory: the run must end normally, and its grants must be one of `ways`.
+// container gets no memory. The grants of such a run must be the first letters of `all`, and at
+// least as many as in each earlier run that aborted. In any other run, the tool and its libraries
+// handle the missing memory: the run must end normally, and its grants must be one of `ways`.
 void ExpectRunsWithoutMemory(Installed& file, const std::string& all,
                              const std::set<std::string>& ways) {
   constexpr int kMostCalls = 20000;

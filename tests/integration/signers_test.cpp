@@ -17,6 +17,8 @@ namespace {
 namespace fs = std::filesystem;
 using Words = std::vector<std::string>;
 
+// The path of `name` in the directory of golden packages. tests/journeys/make_golden_packages signs
+// these packages with real signing tools.
 std::string Golden(const std::string& name) { return std::string(GOLDEN_PACKAGES) + "/" + name; }
 
 // The digest of the key's modulus, which make_golden_packages computed with openssl.
@@ -64,6 +66,7 @@ constexpr int kNotStarted = 5;
 // The signing block is the attacker's.
 class PackageWithTwoFaces : public testing::Test {
  protected:
+  // The package "openssl-cms-issued" is signed with the same key, "rsa-2048-other".
   PackageWithTwoFaces() : apk_(directory_ / "base.apk") {
     const std::string victims = std::string(THREAT_PACKAGES) + "/foreign/base.apk";
     WriteFile(apk_, AddSigningBlock(ToBytes(ContentOf(victims)), "rsa-2048-other"));

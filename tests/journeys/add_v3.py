@@ -1,8 +1,8 @@
 #!/usr/bin/env python3
 """add_v3.py APK CERTIFICATE KEY FIRST LAST [ID]: adds a signature to the signing block of the package
 APK, and keeps the block's other signatures. Makes the block if there is none. The signature is a v3
-signature for phones of the API levels FIRST to LAST. The hexadecimal ID names another scheme that has
-the form of v3. openssl makes the signature."""
+signature for phones of the API levels FIRST to LAST. With ID (hexadecimal), the signature is of the
+scheme with this ID. That scheme must have the form of v3. openssl makes the signature."""
 
 import hashlib
 import struct
@@ -23,7 +23,7 @@ def openssl(*words, data=None):
 
 
 def content_digest(sections):
-    """The digest of the digests of all pieces. A piece has at most 1 MiB."""
+    """Cuts the sections into pieces of at most 1 MiB. Returns the digest of the digests of all pieces."""
     pieces = [section[at:at + (1 << 20)] for section in sections for at in range(0, len(section), 1 << 20)]
     digests = [hashlib.sha256(b"\xa5" + struct.pack("<I", len(piece)) + piece).digest() for piece in pieces]
     return hashlib.sha256(b"\x5a" + struct.pack("<I", len(pieces)) + b"".join(digests)).digest()

@@ -1,6 +1,6 @@
-// Tests what a build pipeline needs from the simulator to stop bad packages: expected signers,
-// warnings that count as refusals, and the journal that a program reads. openssl computes the
-// expected digests.
+// Tests the simulator as a gate, which stops bad packages in a build pipeline: expected signers,
+// warnings that count as refusals, and the journal that a program reads. openssl and coreutils
+// compute the expected digests.
 #include <gtest/gtest.h>
 
 #include <filesystem>
@@ -21,8 +21,8 @@ std::string Golden(const std::string& name) { return std::string(GOLDEN_PACKAGES
 
 std::string Apk(const std::string& name) { return Golden(name) + "/base.apk"; }
 
-// The output of a shell command, without its line end. In the command, $0 is the certificate of the
-// test key.
+// The output of a shell command, without its line end. In the command, $0 is the certificate file
+// of the test key `key`.
 std::string OfCertificate(const std::string& key, const std::string& command) {
   const ProcessResult run =
       RunProcess({"bash", "-o", "pipefail", "-c", command, Golden(key + ".pem")});
@@ -127,8 +127,8 @@ TEST(Signer, UnexpectedSignerIsShownInTextAndJournal) {
   EXPECT_NE(item["text"].get<std::string>().find(PublicKeyDigest("rsa-2048")), std::string::npos);
 }
 
-// For phones of API 28 and later, the signer of the package rotated-key has the second key, but the
-// kernel gets the first key.
+// For phones of API 28 and later, the signer of the package rotated-key has the key rsa-2048-other,
+// but the kernel gets the key rsa-2048.
 TEST(Signer, KeyOfANewerSchemeMustBeExpectedToo) {
   const Lines first = {"--signer", ModulusDigest("rsa-2048")};
   const auto verdicts = [&](const Lines& more) {
@@ -141,7 +141,7 @@ TEST(Signer, KeyOfANewerSchemeMustBeExpectedToo) {
   EXPECT_EQ(verdicts({"--installer=required", "--signer", ModulusDigest("rsa-2048-other")}),
             Lines({"SIGNED, OTHER SIGNER", "-> 0"}));
   EXPECT_EQ(verdicts({"--installer=required", "--api", "27"}), Lines({"SIGNED", "-> 0"}));
-  // If no installer is asked, --signer must also name each signer of the newer signatures.
+  // If no installer is asked, --signer must also name each signer of the schemes v2 and later.
   EXPECT_EQ(verdicts({}), Lines({"NOT ACCEPTED", "-> 1"}));
   EXPECT_EQ(verdicts({"--signer", ModulusDigest("rsa-2048-other")}), Lines({"SIGNED", "-> 0"}));
 }
@@ -231,7 +231,7 @@ TEST(Warning, AppearsForShortKeyOrDebugCertificate) {
   EXPECT_EQ(WarningsOf(MakePackage(options)), Lines({"debug-key"}));
 }
 
-// The expected values are those of coreutils and openssl.
+// The expected digests and sizes are those of coreutils and openssl.
 TEST(Verdict, DescribesFileToolSignerAndCure) {
   const auto sha256 = [](const std::string& file) {
     return RunProcess({"sha256sum", file}).output.substr(0, 64);

@@ -38,8 +38,8 @@ TEST_F(Reason, LibraryInASubdirectoryOfItsAbiIsReported) {
             "installers do not extract it to lib/arm64/sub/libx.so, where the tool looks");
 }
 
-// Phones install the libraries of one processor. Libraries of another processor do not count as
-// refused.
+// A phone installs the libraries of one processor. Without --install=all, the simulator lays out
+// (extracts) only these. The other libraries do not count as refused.
 TEST_F(Reason, LibrariesOfAnotherProcessorAreNotLaidOut) {
   Take("apksigner-sha256-2048");
   Do("rm -r lib");
@@ -66,7 +66,8 @@ TEST_F(Reason, StrictRefusesALibraryThatNoInstallerExtracts) {
   EXPECT_EQ(Told(1, {"--install"}).back(), "-> 0");
 }
 
-// The package without libraries beside it, as a store delivers it.
+// A store delivers a package without libraries beside it. Told always gives --install=no first. The
+// test's own --install option overrides it.
 TEST_F(Reason, LibrariesMissingBesideThePackageAreReported) {
   Take("apksigner-sha256-2048");
   Do("rm -r lib");
@@ -87,8 +88,8 @@ TEST_F(Reason, LibrariesMissingBesideThePackageAreReported) {
   EXPECT_EQ(Told(4, {"--install"})[2], "  ✓ lib/arm64/libvault.so  signed");
 }
 
-// If a package has no libraries beside it, the simulator lays it out even without an --install
-// option: it extracts the libraries as a phone's installer does.
+// If neither lib/arm64 nor lib/arm is beside a package, the simulator lays out the package even
+// without an --install option: it extracts the libraries as a phone's installer does.
 TEST_F(Reason, PackageWithoutLibrariesBesideItIsLaidOut) {
   Take("apksigner-sha256-2048");
   Do("rm -r lib");

@@ -124,7 +124,7 @@ TEST_F(ManyFiles, EmptyOrMissingListGivesStatus2) {
 }
 
 // Each run extracts the package's libraries into a new temporary directory. No output contains the
-// name of this directory, so only the process ID and the date of the run differ.
+// name of this directory, so only the process ID and the time of the run differ.
 TEST_F(ManyFiles, TwoRunsOverOneFileGiveTheSameOutput) {
   const std::string both =
       "for run in 1 2; do sim --journal $run.journal --html $run.html good/base.apk; "

@@ -1,5 +1,5 @@
-// The reasons that the simulator gives for refused packages. The packages are real: developers'
-// tools made them.
+// The reasons and warnings that the simulator gives for files. Most of the packages are real:
+// developers' tools made them.
 #include <gtest/gtest.h>
 
 #include <algorithm>
@@ -106,8 +106,8 @@ TEST_F(Reason, CureByAnotherKeyStatesItsDisadvantage) {
   }
 }
 
-// By default, every version of keytool signs the certificate of an RSA key of 3584 bits with
-// SHA-384. The package keytool-sha256 shows that the cure helps.
+// By default, keytool signs the certificate of an RSA key of 3584 bits with SHA-384. The package
+// keytool-sha256 shows that the cure helps.
 TEST_F(Reason, CertificateSignedWithSha384IsReported) {
   Take("keytool-sha384");
   const Lines told = Told(5);
@@ -129,8 +129,8 @@ TEST_F(Reason, SignatureOverSha512IsReported) {
             "v1.5 with MD5, SHA-1 or SHA-256");
 }
 
-// No tool makes a signature block whose key has the public exponent 1. The test writes such a block
-// for another owner's key, without the private key.
+// Developers' tools make no key with the public exponent 1. The test therefore writes a signature
+// block with such a key itself: another owner's modulus, without the private key.
 TEST_F(Reason, ExponentOf1OrMinus1IsReported) {
   Take("apksigner-sha256-2048");
   Do("unzip -q base.apk META-INF/CERT.SF");

@@ -33,16 +33,17 @@ class RefusedPackage : public testing::Test {
     return Simulate(apk_);
   }
 
-  // The tool refuses the package before it does anything else. It logs the records `reasons` and
-  // signs nothing.
+  // The tool refuses the package before it does anything else. The events `reasons` come first, and
+  // nothing is signed.
   void ExpectRefusalAfter(std::initializer_list<std::string> reasons) const {
     const Simulation run = Run();
     EXPECT_EQ(run.timeline, Timeline({Timeline(reasons), NothingSigned(apk_), Exit(0)}));
     EXPECT_EQ(run.status, 1);
   }
 
-  // The dex file is refused for these reasons when the first step checks the package. By then the
-  // tool knows that the package asks for the permission, so the last step logs an error as well.
+  // VeltSignJni, the first step, refuses the dex file and logs `reasons`. By then the tool knows
+  // that the package asks for the permission, so the last step, the registration, also logs an
+  // error.
   void ExpectDexFileRefusedAfter(std::initializer_list<std::string> reasons) const {
     const Simulation run = Run();
     EXPECT_EQ(
@@ -233,7 +234,7 @@ TEST_F(IncompletePackage, LibraryThatIsAPipeOnDiskIsRefused) {
                              Log(6, "VeltSignJni: File not verified: " + library_ + "\n")});
 }
 
-// Root may read any file. In a user namespace of its own, the tool does not have this right.
+// Root can read any file. In a user namespace of its own, the tool does not have this right.
 TEST_F(IncompletePackage, LibraryThatMayNotBeReadIsRefused) {
   if (!CanMakeNamespaces()) GTEST_SKIP() << kNoNamespaces;
   std::filesystem::permissions(library_, std::filesystem::perms::none);

@@ -1,5 +1,5 @@
-// Tests two things that the simulator prints: the signer, in the words of apksigner, and the
-// warnings about the signer.
+// Tests what the simulator prints about the signature: the signer in the words of apksigner, the
+// schemes, the digest of the modulus, and the warnings.
 #include <gtest/gtest.h>
 
 #include <algorithm>

@@ -1,7 +1,7 @@
-// Packages that other programs read differently than the tool, for example with another signer.
-// The key that the simulator names as the signer's is the key that the tool reads. Only a warning
-// names another key, the one that other programs find. The line of the verdict also contains the
-// alarms, which are the most serious warnings.
+// Packages that other programs read differently than the tool, for example with another signer than
+// the tool finds. The key that the simulator names as the signer's is the key that the tool reads.
+// Only a warning names another key, the one that other programs find. The line of the verdict also
+// contains the alarms, which are the most serious warnings.
 #include <gmpxx.h>
 #include <gtest/gtest.h>
 #include <openssl/mem.h>
@@ -290,7 +290,7 @@ TEST(PackageReadInTwoWays, SigningBlockThatIsTooLargeIsReported) {
       << told.head;
 }
 
-// ---- Damage hides nothing.
+// ---- A damaged entry hides no other finding.
 
 TEST(PackageReadInTwoWays, DamagedEntryHidesNoOther) {
   Package package = MakePackage();

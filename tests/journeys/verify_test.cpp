@@ -175,7 +175,8 @@ TEST(Verify, ControlCharactersInFileNamesAreEscaped) {
                "gr\xc3\xbcn \xc2\xa0 \\xc2\\x9b \\xc2\\x80 \xff: not trusted (errno 22, EINVAL)\n");
 }
 
-// A kernel without the feature does not know its fcntl command, and refuses it with EINVAL.
+// The workstation's kernel does not have the feature. It does not know the feature's fcntl command,
+// and refuses it with EINVAL.
 TEST(Verify, KernelWithoutTheFeatureTrustsNoFile) {
   const TempDir directory;
   const std::string file = directory.Write("file", {});

@@ -1,7 +1,8 @@
 #!/usr/bin/env python3
 """The runs on the real kernel and in the simulated phone, for scripts/kernel.
 
-runs.py files DIRECTORY GOLDEN           makes the files for the runs
+runs.py files DIRECTORY GOLDEN           makes the files for the runs. GOLDEN is the directory of the
+                                         packages that tests/journeys/make_golden_packages made
 runs.py simulate DIRECTORY BUILD OUT     simulates all runs and writes the journals OUT/NAME.journal.
                                          Also writes OUT/runs, a script that makes the same runs under
                                          qemu
@@ -22,8 +23,8 @@ GOOD = "golden/apksigner-sha256-2048"
 # The probe's calls (tests/simulator/phone/probe.cpp). The tool makes only a few of them, but the
 # simulated kernel must answer all of them like a real one.
 PROBES = {
-    # A product's kernel trusts the JARs of its system. Here the probe signs the JARs first, so that
-    # the kernel trusts them.
+    # A phone's kernel trusts the JARs of its system. The kernel under test does not, so the probe
+    # first signs the JARs.
     "trust": ["open jars/trusted.jar", "sign 5 0000", "open jars/trusted-marked.jar", "sign 6 0000",
               "open jars/changed.jar", "sign 7 0000", "open jars/refused.jar", "sign 8 0000",
               "verify 5"],
@@ -46,14 +47,14 @@ PROBES = {
 
 
 class Run:
-    """A run of a program for one file, on a phone that these options of apktoolkit-sim describe.
+    """A run of a program for one file, on a phone that `options` of apktoolkit-sim describe.
 
     before: a shell command that changes the files before the run, under qemu and in the simulation.
     feature: True if the kernel has the file-integrity feature. mount: how the files are mounted.
     confined: True if the run is in the tool's SELinux domain on a kernel with a policy. Runs that
     open a FIFO or a directory are not confined, because the policy has rules only for regular files.
-    Runs of the probe are not confined either: no product contains it, so the policy has no rules for
-    it.
+    Runs of the probe are not confined either: no phone contains the probe, so the policy has no
+    rules for it.
     """
 
     def __init__(self, name, file, *options, program=TOOL, before=None, feature=True, mount="rw",

@@ -1,5 +1,5 @@
-// Tests each reason with a package that is refused for it. Also tests the lines in the log and the
-// release of the archive.
+// Tests each reason except kUnknown with a file that gets this reason. Also tests the lines in the
+// log and the release of the archive.
 #include "library/verification.h"
 
 #include <fcntl.h>

@@ -1,8 +1,8 @@
 #!/usr/bin/env python3
 """Compares the file lists of the platform's build with those of CMake. With --write, corrects the
 platform's lists. Also compares other parts of the two builds: the warnings, and the functions that
-the linker wraps for a test. Also checks that Android 8.1 knows every word of the Android.bp
-files."""
+the linker wraps for a test. Also checks that Android 8.1 knows every type of module and every
+property in Android.bp and tests/Android.bp."""
 
 import json
 import pathlib
@@ -33,7 +33,8 @@ WORKSTATION_ONLY = {
     "fuzz/verdict_fuzz.cpp": "judges with the simulator",
 }
 
-# The words that the build of Android 8.1 knows. An unknown word stops the whole tree.
+# The types and properties of modules that the build of Android 8.1 knows. An unknown type or
+# property stops the build of the whole platform.
 KNOWN_TYPES = {"cc_binary", "cc_defaults", "cc_library_shared", "cc_library_static", "cc_test",
                "filegroup"}
 KNOWN_PROPERTIES = {"cflags", "compile_multilib", "cpp_std", "data", "defaults",
@@ -45,9 +46,9 @@ KNOWN_PROPERTIES = {"cflags", "compile_multilib", "cpp_std", "data", "defaults",
 PLATFORM_ONLY_FLAGS = {"-Wno-sign-conversion", "-Werror"}
 
 
-# For each blueprint, the modules whose sources come from targets of CMake, with these targets. A
-# target is DIRECTORY:NAME, or NAME in the root. In a blueprint, paths are relative to the
-# blueprint's directory.
+# For each blueprint (a file Android.bp or cc_fuzz.bp), the modules whose sources come from targets
+# of CMake, with these targets. A target is DIRECTORY:NAME, or NAME in the root. In a blueprint,
+# paths are relative to the blueprint's directory.
 MODULES = {
     "Android.bp": {"apktoolkit_core": ["apktoolkit_core"], "apktoolkit": ["apktoolkit"],
                    "apktoolkit-verify": ["apktoolkit-verify"],
@@ -130,7 +131,8 @@ def hold_words(platform, tests, problems):
         problems += [f"{module['name']}: Android 8.1 does not know {word}" for word in sorted(words)]
         if module.get("cpp_std", "c++1z") != "c++1z":
             problems.append(f"{module['name']}: Android 8.1 does not know {module['cpp_std']}")
-    # Android 8.1 reads only the named blueprints. Later releases read all that they find.
+    # Android 8.1 reads only the blueprints of the directories in `subdirs`. Later releases read all
+    # blueprints that they find.
     compare("subdirs in Android.bp, and the directories with an Android.bp", platform.variables["subdirs"],
             [path.parent.name for path in ROOT.glob("*/Android.bp")], problems)
 

@@ -1,6 +1,6 @@
 #!/usr/bin/env python3
-"""Runs each command keytool -genkeypair that README.md, docs/guide.md and the manual page show. The
-certificate that each command makes must be signed with SHA-256. The pages also name the default
+"""Runs each command keytool -genkeypair that README.md, docs/guide.md and man/apktoolkit.1 show.
+The certificate that each command makes must be signed with SHA-256. The pages also name the default
 algorithms of some JDKs. If the installed JDK is one of these JDKs, it must use these algorithms."""
 
 import re
@@ -41,7 +41,7 @@ def page_problems():
         if not commands:
             problems.append(f"{page} shows no command that makes a key")
         for command in commands:
-            # keytool asks for the values of these two options if they are missing, so
+            # keytool asks for the values of -dname and -storepass if they are missing, so
             # signature_algorithm() adds them. The page's own values are removed, because keytool
             # warns about an option that is given twice.
             command = re.sub(r" -(dname|storepass) \S+| 2>.*", "", command)

@@ -1,6 +1,6 @@
 #!/usr/bin/env python3
-"""Installs the library into its own directory, builds and runs the example with it as
-examples/README.md shows, and compiles each installed header alone.
+"""Installs the library into a temporary directory, and builds and runs the example there as
+examples/README.md shows. Compiles each installed header alone.
 
 Arguments: the build tree, the compiler, and the directory of a good package.
 """

@@ -13,12 +13,13 @@ import textwrap
 
 from sources import ROOT, report, tool_sources, without_comments
 
-# A text is the first argument of a function that writes: literals, or the name of a constant.
+# A message's text is the first argument of LogInfo, LogError or Fail: literals, or the name of a
+# constant.
 LITERALS = r'(?:"(?:[^"\\]|\\.)*"\s*)+'
 CALL = re.compile(r"\b(LogInfo|LogError|Fail)\(\s*(%s|k\w+)" % LITERALS)
 CONSTANT = re.compile(r"constexpr char (k\w+)\[\] =\s*(%s)" % LITERALS)
 
-# For each function that writes: the priority of its texts, and their prefix. Fail is a function of
+# For each of these functions: the priority of its texts, and their prefix. Fail is a function of
 # crypto/pkcs7.cpp. It writes to standard output.
 WRITERS = {
     "LogInfo": ("Info", ""),

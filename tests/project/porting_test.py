@@ -1,8 +1,8 @@
 #!/usr/bin/env python3
 """Compares docs/porting.md with the sources: the interface, the modules of the blueprint, the
 example of a JAR's key block, the links to the page's own headings, and the links to all directories
-of integration/. Writes the directories of installed libraries, as apk/native_libraries.h has them,
-to docs/porting.md and to the tool's manual page."""
+of integration/. Also compares docs/porting.md and the tool's manual page with the directories of
+installed libraries in apk/native_libraries.h. With --write, writes these directories to both."""
 
 import hashlib
 import re
@@ -72,7 +72,8 @@ def link_problems():
 
 
 def with_library_directories():
-    """Both pages, with the directories of apk/native_libraries.h."""
+    """The correct texts of docs/porting.md and the manual page, with the directories of
+    apk/native_libraries.h."""
     installed = {}
     for entry, directory in re.findall(r'\{"(lib/[^"]+)", "(lib/[^"]+)"\}',
                                        (ROOT / "apk/native_libraries.h").read_text()):

@@ -1,7 +1,8 @@
 #!/usr/bin/env python3
 """Reads the JUnit reports and SARIF logs of real runs. Some of the checked files have odd names.
 
-Arguments: the directory of the golden packages, and the command line that starts apktoolkit-sim.
+Arguments: the directory of the golden packages (made by tests/journeys/make_golden_packages), and the
+command line that starts apktoolkit-sim.
 
 junitparser reads the JUnit reports. A SARIF log is checked with the schema SARIF below. The schema
 has those objects and properties of the standard (OASIS, SARIF 2.1.0) that the simulator writes. The

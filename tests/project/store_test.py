@@ -1,7 +1,7 @@
 #!/usr/bin/env python3
 """Runs the commands of docs/store.md over a few hundred packages on this machine. Kills all of the
-work in the middle, and continues it. No result may be lost, and none may be there twice. A journal
-that was cut off must not count as a result.
+work in the middle, and continues it. Each result must then be there exactly once. A journal that
+was cut off must not count as a result.
 
 Arguments: the directory of the golden packages, and the command line that starts apktoolkit-sim.
 """

@@ -2,7 +2,7 @@
 #include <cstdint>
 #include <cstdio>
 
-// No header declares the function, so its file is included.
+// No header declares montgomery_constant, so its file is included.
 #include "crypto/mpi_pow_mod.cpp"
 
 int main() {

@@ -1,10 +1,10 @@
 #!/usr/bin/env python3
-"""Compiles integration/sepolicy with stand-ins for the platform's policy, for each API level in
-LEVELS. The policy must grant exactly the permissions that are listed below. file_contexts must be
-valid, exactly one of its patterns must match each program of the kit, and each pattern a program.
+"""Compiles integration/sepolicy for each API level in LEVELS. Files *.conf beside this script take
+the place of the platform's policy. The policy must grant exactly the permissions of GRANTED, and
+with libzu also those of GRANTED_WITH_ZU. The compilation must fail with each rule of REFUSED.
 
-m4, checkpolicy, secilc and setfiles are Debian's. The compilation must fail with each rule of
-REFUSED.
+file_contexts must be valid. Each installed program must match exactly one of its patterns, and each
+pattern must match a program. m4, checkpolicy, secilc and setfiles are Debian's.
 """
 
 import pathlib
@@ -68,7 +68,7 @@ GRANTED_WITH_ZU = {
     "zu_server": ["apktoolkit:binder transfer"],
 }
 
-# Rules that the kit's own assertions must refuse in any product's policy.
+# Rules that the neverallow rules of integration/sepolicy must refuse in any product's policy.
 REFUSED = [
     "allow apktoolkit apk_data_file:file write;",
     "allow apktoolkit system_file:file append;",
@@ -158,7 +158,7 @@ def check(directory, level):
 
 
 def check_names():
-    """Checks that each program of the kit matches exactly one pattern of file_contexts, and that
+    """Checks that each installed program matches exactly one pattern of file_contexts, and that
     each pattern matches a program."""
     programs = ["apktoolkit", "apktoolkit-all", "apktoolkit-bound", "apktoolkit-verify"]
     patterns = [line.split()[0] for line in (KIT / "file_contexts").read_text().splitlines()
@@ -170,7 +170,7 @@ def check_names():
             problems.append(f"/system/bin/{name} has {count} labels")
     for pattern in patterns:
         if not any(re.fullmatch(pattern, f"/system/bin/{name}") for name in programs):
-            problems.append(f"file_contexts: {pattern} matches no program of the kit")
+            problems.append(f"file_contexts: {pattern} matches no installed program")
     return problems
 
 

@@ -90,8 +90,8 @@ TEST(ZuSign, RegistersTheSecondDescriptor) {
 }
 
 TEST(ZuSign, PackageWithABadDexFileIsNotRegistered) {
-  // The permission is read only if META-INF/MANIFEST.MF verified. In this package, therefore, only
-  // the dex file is bad.
+  // The permission is read only if META-INF/MANIFEST.MF verified, so this test damages only the dex
+  // file.
   Package package = SecureStoragePackage();
   package.Tamper("classes.dex");
   ArchiveOnPhone file(package);

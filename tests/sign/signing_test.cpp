@@ -157,7 +157,7 @@ TEST(VeltSignJni, DescriptorOfALibraryIsClosed) {
   EXPECT_EQ(fcntl(file.fd() + 1, F_GETFD), -1);
 }
 
-// This happens if the process was started without standard input.
+// A library gets descriptor 0 if the process was started without standard input.
 TEST(VeltSignJni, LibraryMayHaveDescriptor0) {
   const ZipItem library = Library("lib/arm64-v8a/libfoo.so");
   PackageOnPhone file(MakePackage(WithLibraries({library})));
@@ -180,7 +180,8 @@ TEST(VeltSignJni, LibraryIsOpenedWithoutWaiting) {
   EXPECT_EQ(flags, std::vector<int>({O_RDONLY | O_NONBLOCK | O_CLOEXEC, O_RDONLY | O_NONBLOCK}));
 }
 
-// A file among the libraries that is not a library is left alone, even if the manifest lists it.
+// A file whose name does not end in ".so" is not signed, even if it is among the libraries and the
+// manifest lists it.
 TEST(VeltSignJni, EntryWithAnotherEndingIsNotALibrary) {
   const std::vector<ZipItem> others = {Library("lib/arm64-v8a/libfoo.so.txt"),
                                        Library("lib/arm64-v8a/libfoo.SO"),

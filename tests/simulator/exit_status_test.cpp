@@ -146,7 +146,8 @@ TEST(ExitStatus, IsThreeWhenTheToolIsNotAProgram) {
 TEST(ExitStatus, IsThreeWhenRunnerIsMissingOrStandInsAreNotLoaded) {
   if (AreProgramsEmulated()) GTEST_SKIP() << "the emulator hides that a program does not start";
   const TempDir directory;
-  // This tool is a script that starts `true` without LD_PRELOAD, so the stand-ins are not loaded.
+  // This tool is a script that starts `true` without LD_PRELOAD, so the simulator's libraries (the
+  // stand-ins) are not loaded.
   const std::string tool = directory.WriteProgram("tool", "#!/usr/bin/env -S -u LD_PRELOAD true\n");
   const ProcessResult result =
       RunProcess({SimulatorPath(), "--runner", "/nowhere/emulator", "--tool", tool, "/"});

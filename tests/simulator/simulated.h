@@ -16,7 +16,7 @@ inline ProcessResult Told(const Lines& words) {
   return RunProcess(command);
 }
 
-// The same with the probe as the tool.
+// Like Told, but with the probe as the tool.
 inline ProcessResult Simulated(Lines words) {
   words.insert(words.begin(), {"--tool", PROBE_PATH});
   return Told(words);

@@ -59,7 +59,8 @@ TEST(SimulatorOutput, KeepTheirOrderWhenSeveralRunAtATime) {
   EXPECT_EQ(started, files);
 }
 
-// A progress line is overwritten later, so a pipe gets none.
+// The simulator overwrites a progress line later. It cannot do so in a pipe, so a pipe gets no
+// progress lines.
 TEST(SimulatorOutput, ShowNoProgressWithoutATerminal) {
   const Probe slow({"sign 3 0000", "sleep 2"});
   EXPECT_EQ(Simulated({slow.path()}).errors, "");
@@ -268,7 +269,7 @@ TEST(Simulation, SurvivesAFileThatShrinksAndGoesOnToTheNext) {
   MakePackage(options).WriteTo(directory / "whole.apk");
   MakePackage().WriteTo(directory / "good.apk");
   const std::string script =
-      // AddressSanitizer would report the signal as an error of the tool.
+      // AddressSanitizer would report the signal SIGBUS as an error of the tool.
       "export ASAN_OPTIONS=\"$ASAN_OPTIONS:handle_sigbus=0\"\n"
       "cd \"$1\"; sim=$2; cp whole.apk base.apk\n"
       "(while [ ! -e end ]; do truncate -s 3000 base.apk; cp whole.apk base.apk; done) & loop=$!\n"

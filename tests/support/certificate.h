@@ -1,8 +1,8 @@
 // Builds X.509 certificates (RFC 5280 §4.1), good and malformed.
 //
 // Each field of type Bytes has the DER for its place, including the identifier and length octets. A
-// test changes a certificate by assigning to a field. If a field is left unset, Build makes it from
-// the keys and the digest.
+// test changes a certificate by assigning to a field. If an optional field has no value, Build
+// computes it from the other members.
 #pragma once
 
 #include <optional>
@@ -22,7 +22,7 @@ Bytes DigestOf(Digest digest, const Bytes& data);
 // the ECDSA signature.
 Bytes SignWith(const std::string& key, Digest digest, const Bytes& data);
 // The encoded message of the data (RFC 8017 §9.2) in `size` bytes. The padding fills the remaining
-// bytes and may be empty. Returns no bytes if the DigestInfo does not fit.
+// bytes and can be empty. Returns no bytes if the DigestInfo does not fit.
 Bytes EncodedMessage(Digest digest, const Bytes& data, size_t size);
 // An AlgorithmIdentifier with NULL or the given parameters.
 Bytes AlgorithmIdentifier(const std::string& oid, const Bytes& parameters = der::Null());

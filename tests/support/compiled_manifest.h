@@ -8,7 +8,7 @@
 
 #include "support/der.h"
 
-// One attribute of an element. Names and texts are UTF-8 and may contain NUL. Three bytes may
+// One attribute of an element. Names and texts are UTF-8 and can contain NUL. Three bytes can
 // encode an unpaired surrogate: U+D800 is ED A0 80.
 struct XmlAttribute {
   std::string name;

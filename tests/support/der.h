@@ -1,5 +1,5 @@
-// Writes DER (X.690), for the builders and for tests that need an element that no builder makes.
-// Nothing is checked: a test may nest and label elements wrongly.
+// Writes DER (X.690), for the builders of test data in this directory, and for tests that need an
+// element that no builder makes. Nothing is checked: a test may nest and label elements wrongly.
 #pragma once
 
 #include <cstdint>

@@ -8,7 +8,7 @@
 #include <cstddef>
 
 // While it lives, makes one call of malloc fail and watches the blocks of the other calls. Only one
-// may live at a time.
+// FailingMalloc may live at a time.
 class FailingMalloc {
  public:
   // Makes call number `failing_call` fail, counted from 1; 0 lets all succeed.

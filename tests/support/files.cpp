@@ -19,7 +19,7 @@ namespace {
   abort();
 }
 
-// The directory for temporary files: TMPDIR, or else that of a workstation or of a phone.
+// The directory for temporary files: TMPDIR if it is set, else /tmp, or /data/local/tmp on a phone.
 std::string TemporaryDirectory() {
   if (const char* const named = getenv("TMPDIR"); named != nullptr) return named;
   return access("/tmp", W_OK) == 0 ? "/tmp" : "/data/local/tmp";

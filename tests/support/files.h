@@ -9,7 +9,7 @@
 // A new empty directory.
 class TempDir {
  public:
-  // Makes it below the directory for temporary files, or below `parent`.
+  // Makes the directory below the directory for temporary files, or below `parent`.
   explicit TempDir(const std::string& parent = {});
   ~TempDir();
   TempDir(const TempDir&) = delete;
@@ -19,7 +19,7 @@ class TempDir {
   const std::string& path() const { return path_; }
   // The path of `name` in the directory.
   std::string operator/(const std::string& name) const { return path_ + "/" + name; }
-  // The same; also makes the directories above it.
+  // Like operator/, and also makes the directories above `name`.
   std::string File(const std::string& name) const;
   // Writes a file, and makes the directories above it. Returns its path.
   std::string Write(const std::string& name, const Bytes& content) const;
@@ -63,7 +63,7 @@ class MemoryFile {
   std::string path_;
 };
 
-// While it lives, no file is open under the number `fd`.
+// While this object exists, no file is open under the number `fd`.
 class FreeDescriptor {
  public:
   explicit FreeDescriptor(int fd);

@@ -1,5 +1,5 @@
-// Bytes that end where memory ends. A read after the end crashes in every build, with or without a
-// sanitizer.
+// Bytes at the end of readable memory. A read after the end crashes in every build, with or without
+// a sanitizer.
 #pragma once
 
 #include <sys/mman.h>

@@ -40,6 +40,6 @@ extern "C" int __android_log_print(int priority, const char* tag, const char* fo
   const int length = vsnprintf(text, sizeof(text), format, arguments);
   va_end(arguments);
   KeepLogRecord(priority, tag, text);
-  if (IsTools(tag)) errno = EDOM;  // the log library may change errno; LogText must restore it
+  if (IsTools(tag)) errno = EDOM;  // the log library can change errno; LogText must restore it
   return length;
 }

@@ -1,8 +1,8 @@
 // Catches the Android log of the code under test.
 //
-// The test program defines __android_log_print itself, so that the records of the tool, and of the
-// platform libraries under it, come here and do not go to standard error. A LogCapture keeps the
-// records with the tool's tag, in order, while it lives.
+// The test program defines __android_log_print itself, so that the records that the tool and the
+// platform libraries write with this function come here and do not go to standard error. A
+// LogCapture keeps the records with the tool's tag, in order, while it lives.
 #pragma once
 
 #include <string>
@@ -16,7 +16,7 @@ struct LogRecord {
 bool operator==(const LogRecord& a, const LogRecord& b);
 std::ostream& operator<<(std::ostream& out, const LogRecord& record);
 
-// Only one may live at a time. The newest record is the last.
+// Only one LogCapture may live at a time. The newest record is the last.
 class LogCapture {
  public:
   LogCapture();

@@ -10,5 +10,5 @@
 // of memory. Up to 3 bytes follow the block, because it starts at a multiple of 4. Only one such
 // block may be in use at a time.
 void PutNextBlockAtMemoryEnd(size_t size);
-// True if the block was put there. If not, forgets the request.
+// True if the block was put at the end of memory. If not, forgets the request.
 bool WasPutAtMemoryEnd();

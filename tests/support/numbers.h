@@ -1,5 +1,5 @@
 // Operands for the tests of the large integers in crypto/mpi.h: made of given limbs or drawn at
-// random. Also converts them to GMP's numbers.
+// random. Also converts between these integers and GMP's numbers.
 #pragma once
 
 #include <gmpxx.h>
@@ -45,7 +45,8 @@ inline Limbs LimbsOf(const mpz_class& z) {
 
 inline mpz_class PowerOfTwo(unsigned long exponent) { return mpz_class(1) << exponent; }
 
-// Operands that are random, or made of limbs that provoke carries, borrows and wrong estimates.
+// Operands that are random, or made of limbs that provoke carries, borrows and wrong estimates of a
+// quotient.
 class Operands {
  public:
   uint32_t Below(uint32_t bound) { return static_cast<uint32_t>(random_() % bound); }

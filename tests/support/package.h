@@ -38,10 +38,10 @@ struct PackageOptions {
   std::string base_name = "META-INF/CERT";
   std::string block_extension = ".RSA";
 
-  // Each gets the text that was made, and returns the text to sign.
+  // Each function gets the generated text, and returns the text that the package gets instead.
   std::function<std::string(const std::string&)> edit_manifest;
   std::function<std::string(const std::string&)> edit_signature_file;
-  // The key, digest and faults of the block.
+  // The key, digest and faults of the signature block.
   SignatureBlock block;
 };
 

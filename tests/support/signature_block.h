@@ -1,8 +1,8 @@
 // Builds the signature block of a signed JAR: a PKCS#7 SignedData (RFC 2315 §9) without content,
 // with one signer.
 //
-// The defaults make a good block. Each field changes one part of it. An optional field has DER,
-// which replaces the part that Build would make.
+// The defaults make a good block. Each field changes one part of it. An optional field that is set
+// has DER, which replaces the part that Build would make.
 #pragma once
 
 #include <optional>
@@ -24,7 +24,8 @@ struct SignatureBlock {
   // The signature covers other bytes than the signature file.
   bool wrong_digest = false;
 
-  // The contents of the element [0], which has the certificates; empty: no certificates.
+  // The contents of the element [0], which has the certificates. If set to no bytes, the element is
+  // empty.
   std::optional<Bytes> certificates;
   std::optional<Bytes> digest_algorithm;  // the SignerInfo's
   std::optional<Bytes> encrypted_digest;  // the whole OCTET STRING
@@ -43,8 +44,8 @@ struct SignatureBlock {
   Bytes SignedData(const Bytes& signature_file) const;
 };
 
-// A block over the signature file that anyone can make without the private half of the RSA test key
-// `victim`. It has encoded messages in place of signatures. They count as signatures if the public
-// operation returns its argument, as it does for the exponent 1. `exponent` is the contents of the
-// exponent INTEGER.
+// A block for the signature file. Its certificate has the modulus of the RSA test key `victim`, but
+// no private key is needed to make the block. The block has encoded messages in place of
+// signatures. These messages count as signatures if the public operation returns its argument, as
+// for the exponent 1. `exponent` is the contents of the exponent INTEGER.
 Bytes ForgedBlock(const Bytes& signature_file, const std::string& victim, const Bytes& exponent);

@@ -27,7 +27,7 @@ Bytes Prefixed(const std::vector<Bytes>& pieces) {
   return Concat({Number32(static_cast<uint32_t>(whole.size())), whole});
 }
 
-// The parts of an archive without a comment.
+// The parts of an archive that has no comment.
 struct ArchiveParts {
   Bytes entries, directory, end_record;
 };

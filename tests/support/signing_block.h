@@ -1,8 +1,9 @@
 // Writes the APK signing block of the schemes that followed JAR signing (APK Signature Scheme v2,
-// v3, v3.1), with one function for each layer. The block is between an archive's entries and its
-// central directory. It protects the entries of META-INF like all other entries. Numbers are
-// little-endian. The size of the block and the length before each of its pairs have 64 bits. Inside
-// a pair's value, every list and element has a length of 32 bits before it.
+// v3, v3.1), with one function for each layer. The block is a list of pairs of scheme and value,
+// between an archive's entries and its central directory. It protects the entries of META-INF like
+// all other entries. Numbers are little-endian. The size of the block and the length before each of
+// its pairs have 64 bits. Inside a pair's value, every list and element has a length of 32 bits
+// before it.
 #pragma once
 
 #include <cstdint>

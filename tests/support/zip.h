@@ -28,13 +28,13 @@ struct ZipItem {
   bool data_descriptor = false;
 
   std::optional<Bytes> raw = {};        // in the archive in place of the (compressed) data
-  std::optional<uint16_t> method = {};  // in place of 0 or 8
+  std::optional<uint16_t> method = {};  // in place of 0 (stored) or 8 (deflated)
   std::optional<std::string> local_name = {};
   ZipClaim local = {}, central = {}, descriptor = {};
 };
 
-// An item that claims this length in every place. If the item has a data descriptor, its local
-// header claims 0.
+// The item with this uncompressed length in both headers and in the data descriptor. Exception: if
+// the item has a data descriptor, its local header claims 0.
 ZipItem ClaimingLength(ZipItem item, uint32_t length);
 
 // The archive of the items, in order. Names may occur twice.

@@ -52,7 +52,7 @@ TEST(CompiledManifestAtMemoryEnd, IsNotReadBeyondTheBlockForAMissingNode) {
   }
 }
 
-// An attribute of size 0 may be at the end of its element. All its fields are then beyond the
+// An attribute of size 0 can be at the end of its element. All its fields are then beyond the
 // element.
 TEST(CompiledManifestAtMemoryEnd, IsNotReadBeyondTheBlockForAMissingAttribute) {
   constexpr size_t kNode = 36, kAttribute = 20;

@@ -63,7 +63,7 @@ TEST(Threat, FirstCertificateAndFirstSignatureOfTwoSignersCount) {
   for (const Strings& certificates : {one, other}) {
     for (const Strings& signers : {one, other}) {
       const Package package = WithTwoSigners(certificates, signers);
-      // Other readers look for the certificate that belongs to each signature.
+      // OpenSSL looks for the certificate that belongs to each signature.
       EXPECT_TRUE(IsVerifiedByOpenssl(package));
       const bool is_pair = certificates[0] == signers[0];
       EXPECT_EQ(Device(package).FilesSignedFor(certificates[0]),
@@ -233,7 +233,7 @@ TEST(Threat, DamagedLibraryEndsTheIterationAndLaterOnesStayUnsigned) {
 
 // ---- Files that are written to during the run.
 
-// Runs the steps. Returns the path of each signed file, and its bytes when it was signed.
+// Runs the tool's steps. Returns the path of each signed file, and its bytes when it was signed.
 std::map<std::string, std::string> BytesSigned(Device& device) {
   std::map<std::string, std::string> signed_bytes;
   device.phone.witness = [&](int fd, const std::string& event) {

@@ -1,5 +1,5 @@
-// The fixture for tests of util/file.h: a directory for files, and results that the kernel returns
-// for real files only by chance.
+// The fixture for tests of util/file.h: a directory for files, and replaceable system calls. A test
+// can choose results that the kernel rarely returns for real files.
 #pragma once
 
 #include <gtest/gtest.h>

@@ -23,7 +23,7 @@ namespace {
 
 using nlohmann::json;
 
-// Flags of vectors whose result may differ from the tool's verdict. AcceptedShortPadding is this
+// Flags of vectors whose result can differ from the tool's verdict. AcceptedShortPadding is this
 // project's flag. It marks vectors that are invalid by RFC 8017, and that the tool accepts on
 // purpose. WrongHash is Wycheproof's flag. It marks signatures that are made with another digest
 // than the key is for. The tool accepts any digest that it knows, because the signature itself
@@ -68,8 +68,8 @@ Bytes WithoutLeadingZeros(Bytes number) {
 
 class Key {
  public:
-  // In an older file, a test group has the key's numbers in "n" and "e". In a newer file, it has
-  // them in "publicKey".
+  // In an older file, a test group has the key's numbers in "n" and "e". In a newer file, the group
+  // has them in "publicKey".
   explicit Key(const json& group) {
     const bool is_newer = group.contains("publicKey") && group["publicKey"].is_object();
     const json& key = is_newer ? group["publicKey"] : group;
@@ -214,8 +214,8 @@ GTEST_ALLOW_UNINSTANTIATED_PARAMETERIZED_TEST(VectorsOfTheDirectory);
 INSTANTIATE_TEST_SUITE_P(Files, VectorsOfTheDirectory, testing::ValuesIn(NamesInTheDirectory()),
                          [](const auto& parameter) { return parameter.param; });
 
-// This project has shortened copies of some of these files (wycheproof_*.json). take_wycheproof
-// must print exactly this copy if there is one.
+// This project has shortened copies of some files of the directory (wycheproof_*.json). If a file
+// has such a copy, take_wycheproof must print exactly the copy.
 TEST_P(VectorsOfTheDirectory, GetTheExpectedVerdictsAndMatchTheirCopies) {
   EXPECT_GT(JudgeFile(file_).refused, 0);
   std::string kept = GetParam() + ".json";

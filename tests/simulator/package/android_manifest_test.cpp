@@ -72,8 +72,8 @@ TEST(AndroidManifestFacts, PackageNameIsReadInEitherEncoding) {
   }
 }
 
-// The tool uses the first attribute with this local name. The installer uses the attribute without
-// a namespace.
+// The tool uses the first attribute with the local name "package". The installer uses the attribute
+// "package" without a namespace.
 TEST(AndroidManifestFacts, PackageNameWithANamespaceCountsOnlyForTheTool) {
   for (const auto pool : kPools) {
     CompiledXml xml(pool);

@@ -156,8 +156,8 @@ TEST(PackageFacts, EntryWithASha1DigestIsMarked) {
             std::vector<std::string>({"a"}));
 }
 
-// The digests are those of "x", as coreutils and xxd print them: printf x | sha256sum | xxd -r -p |
-// base64, and the same with sha1sum.
+// The digests other than "AAAA" are those of "x", as coreutils and xxd print them: printf x |
+// sha256sum | xxd -r -p | base64, and the same with sha1sum.
 TEST(PackageFacts, EachListedEntryIsComparedWithItsDigest) {
   const std::string manifest =
       "Manifest-Version: 1.0\r\n\r\n"

@@ -104,8 +104,9 @@ TEST(JarSignatureFacts, CertificateIsMissingIfTheBlockIsNotDer) {
   const Bytes certificate = SignatureBlock().SignerCertificate().Build();
   const auto at = std::search(block.begin(), block.end(), certificate.begin(), certificate.end());
   ASSERT_NE(at, block.end());
-  // A0 82 hh ll becomes A0 83 00 hh ll: a length that is not minimal, which DER forbids. The
-  // lengths of the elements around it are then wrong.
+  // The element [0] around the certificate begins with A0 82 hh ll. This becomes A0 83 00 hh ll:
+  // the length is not minimal, which DER forbids. The lengths of the elements around [0] are then
+  // wrong.
   const auto inserted = block.insert(at - 2, 0);
   *(inserted - 1) = 0x83;
   const JarSignatureFacts jar = SignatureOf(package);
@@ -119,7 +120,7 @@ TEST(JarSignatureFacts, SignerThatNamesAnotherCertificateIsSeen) {
   EXPECT_TRUE(SignatureOf(MakePackage(options)).names_other_certificate);
   EXPECT_FALSE(SignatureOf(MakePackage()).names_other_certificate);
   // A block without a readable signer names no certificate. Its empty signer identifier must not be
-  // compared with the key identifier of this certificate.
+  // compared with the key identifier of the certificate in the block.
   Certificate certificate;
   certificate.extensions = {Extension("2.5.29.14", der::OctetString({1, 2, 3}))};
   options.block.certificates = certificate.Build();

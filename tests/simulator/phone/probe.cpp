@@ -1,7 +1,8 @@
 // probe FILE: takes the place of the tool in tests. Executes the lines of FILE, each of which is a
 // command and its arguments. For each command, writes the line "RESULT ERRNO" to FILE.out. errno is
-// set to 77 before the command. In place of the digits of a payload, "null", "wild" and "cut" name
-// memory that cannot be read. "cut" is a payload that continues into an unmapped page.
+// set to 77 before the command, so that the line shows whether the command changed it. In place of
+// a payload's digits, "null" and "wild" name memory that cannot be read, and "cut" names a payload
+// that continues into an unmapped page.
 #include <fcntl.h>
 #include <sys/mman.h>
 #include <sys/resource.h>
@@ -22,7 +23,7 @@
 #include "sign/libzu.h"
 #include "simulator/phone/log_library.h"
 
-// Programs that are built for large files call fcntl by this name.
+// Programs that are built for large files call fcntl by the name fcntl64.
 extern "C" int fcntl64(int, int, ...);
 
 namespace {

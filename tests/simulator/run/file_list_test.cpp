@@ -16,8 +16,8 @@ namespace {
 namespace fs = std::filesystem;
 using Lines = std::vector<std::string>;
 
-// The listed names, without the path of `directory`. A listed directory also has the reason why the
-// tool is not run for it. If listing failed, the only line is the reason.
+// The listed names, without the path of `directory`. A name for which the tool is not run also has
+// the reason. If ListFiles failed, the only line is its message.
 Lines Listed(const TempDir& directory, const FileListOptions& options, size_t* others = nullptr) {
   FileList list;
   if (const auto problem = ListFiles(options, &list)) return {*problem};

@@ -35,8 +35,9 @@ void SetBytes(const std::string& file, const char* bytes) {
   close(fd);
 }
 
-// Writes `bytes` and restores the mtime, so that only the ctime differs. A program can hide a
-// change of the bytes in this way. chmod also changes only the ctime, but no bytes.
+// Writes `bytes` and restores the mtime, so that of the file's state only the ctime differs. A
+// program can hide a change of the bytes in this way. But a new ctime alone does not prove such a
+// change: chmod also sets the ctime.
 void ChangeTheInodeAlone(const std::string& file, const char* bytes) {
   struct stat before = {};
   ASSERT_EQ(stat(file.c_str(), &before), 0);
@@ -70,7 +71,7 @@ TEST(FileWatch, NoticesEachKindOfChange) {
   }));
 }
 
-// If only the ctime differs, the digest decides.
+// If only the ctime differs, the digest decides. Without a digest, the file counts as changed.
 TEST(FileWatch, ChangeOfTheInodeAloneCountsIfTheBytesDiffer) {
   EXPECT_FALSE(IsNoticed([](const std::string& file) { ChangeTheInodeAlone(file, "abc"); }));
   EXPECT_TRUE(IsNoticed([](const std::string& file) { ChangeTheInodeAlone(file, "abd"); }));

@@ -45,7 +45,7 @@ std::vector<std::string> LaidOutOf(const PackageOptions& package, InstalledAbi a
   return files;
 }
 
-// The same for a package with these libraries.
+// Like LaidOutOf, for a package with these libraries.
 std::vector<std::string> LaidOut(const std::vector<ZipItem>& libraries, InstalledAbi abi,
                                  std::vector<std::string>* left_out = nullptr) {
   return LaidOutOf(WithLibraries(libraries), abi, left_out);
@@ -71,8 +71,8 @@ TEST(Installation, HasTheLibrariesOfTheChosenProcessors) {
   EXPECT_EQ(LaidOut(kBoth, InstalledAbi::kArm64), Files({"lib/arm64/liba.so 64"}));
   EXPECT_EQ(LaidOut(kBoth, InstalledAbi::kArm), Files({"lib/arm/liba.so 32"}));
   EXPECT_EQ(LaidOut({kBoth[2]}, InstalledAbi::kAll), Files({"lib/arm/liba.so old"}));
-  // If a package has two ABIs for one processor, the second one is not laid out, even if its
-  // libraries have other names.
+  // If a package has two ABIs for one processor, only the libraries of the preferred ABI are
+  // extracted, even if those of the other ABI have other names.
   EXPECT_EQ(LaidOut({kBoth[1], {"lib/armeabi/libb.so", ToBytes("old")}}, InstalledAbi::kAll),
             Files({"lib/arm/liba.so 32"}));
 }

@@ -47,7 +47,7 @@ TEST(SignedBytes, AreTrustedWithoutReadingIfTheFileIsUnchanged) {
   EXPECT_FALSE(bytes.Holds(file, kLater));
 }
 
-// The size and the mtime are the same, and only the ctime differs.
+// The bytes change, but the size and the mtime stay the same. Only the ctime shows the change.
 TEST(SignedBytes, AreNotTrustedIfChangedWithTheSameMtime) {
   const TempDir directory;
   const std::string file = directory.Write("file", ToBytes("abc"));
@@ -73,7 +73,7 @@ TEST(SignedBytes, AreNotTrustedIfTheyCannotBeReadInTime) {
   EXPECT_FALSE(kept.Add(file, kPassed));
 }
 
-// Reading a pipe would wait forever, and reading a device would never end.
+// Reading the pipe would wait forever, and reading /dev/zero would never end.
 TEST(SignedBytes, AreNotReadFromPipesAndDevices) {
   const TempDir directory;
   const std::string pipe = directory / "pipe";

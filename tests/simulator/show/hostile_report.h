@@ -1,4 +1,4 @@
-// A report in which every text that a hostile file controls is the same text.
+// A report in which every text that a hostile file controls contains the same text.
 #pragma once
 
 #include <string>

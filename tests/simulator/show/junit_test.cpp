@@ -120,8 +120,8 @@ TEST(Junit, HostileTextDoesNotBecomeMarkup) {
   EXPECT_EQ(read.find("\nimg "), std::string::npos);
 }
 
-// The text has all bytes except 0, all characters from U+0080 to U+FFFF, and a few above. Some of
-// them are characters that XML does not allow (XML 1.0 §2.2).
+// The text has all bytes except 0, all code points from U+0080 to U+FFFF, even the surrogates, and
+// a few code points above U+FFFF. XML does not allow some of these code points (XML 1.0 §2.2).
 TEST(Junit, EveryCharacterGivesAWellFormedDocument) {
   std::string text;
   for (int byte = 1; byte < 256; ++byte) text += static_cast<char>(byte);

@@ -376,7 +376,7 @@ TEST(Page, SaysWhereTheInstallerWasNotAskedOrGaveUp) {
   EXPECT_TRUE(Has(page, "</span> signs only a part of it</td>"));
 }
 
-// --signer and --werror do not change what the tool does.
+// The gate (verdict/gate.h) enforces --signer and --werror. It does not change what the tool does.
 TEST(Page, ToolSignsAPackageThatTheGateRefuses) {
   Report report = Example(Verdict::kNotAccepted);
   report.chain = {{"key", LinkState::kHolds, ""}};

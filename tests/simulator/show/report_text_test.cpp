@@ -175,8 +175,8 @@ TEST(ReportText, NamesWidenTheColumnUpTo40Characters) {
   EXPECT_EQ(column(longest + "l"), 4U + 40 + 2);
 }
 
-// Neighbouring items with the same cure print it once. The lines are the verdict, the three items,
-// and the two lines of the cure.
+// For neighbouring items with the same cause, the cure is printed once. The lines are the verdict,
+// the three items, and the two lines of the cure.
 TEST(ReportText, NeighboursWithTheSameCausePrintOneCure) {
   Report report = Example();
   report.items = {

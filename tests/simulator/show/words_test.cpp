@@ -126,7 +126,7 @@ TEST(HeadFacts, ShowTheInstallersReasonIfItDecidesTheVerdict) {
   EXPECT_EQ(HeadFacts(report, "..."), Lines({"phones do not install it: why"}));
 }
 
-// The first line alone must show that another signer signed.
+// The first line alone must show that a signer whom --signer does not name has signed.
 TEST(HeadFacts, HaveASignerWhoWasNotExpectedBesideAnyReason) {
   Report report = WithSigner();
   report.verdict = Verdict::kPartlySigned;

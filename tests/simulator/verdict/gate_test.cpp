@@ -143,8 +143,7 @@ TEST(Gate, SaysThatASignerHasNoReadableName) {
                 kOther.key.modulus_sha256 + ")");
 }
 
-// The gate compares the modulus that the kernel gets. A certificate that shows another key does not
-// count.
+// A certificate counts only if it contains the key whose digest the kernel gets.
 TEST(Gate, CertificateWithoutTheKernelsKeyDoesNotCount) {
   Report report = SignedBy(kOwner);
   report.key->sha256 = kOther.key.modulus_sha256;
@@ -404,7 +403,7 @@ TEST(OneSignerGate, SignersAreComparedInAnyOrder) {
                 kOther.key.modulus_sha256 + ")");
 }
 
-// If no installer is asked, a file counts as signed by the signers that it names.
+// If no installer is asked, the signers of the newest scheme in the file count.
 TEST(OneSignerGate, NewestSchemesInTheFilesCountWithoutAnInstaller) {
   Report by_owner = SignedBy(kOwner), by_other = SignedBy(kOwner);
   by_owner.newer = {{"v2", kOther}, {"v3", kOwner}};
@@ -424,7 +423,8 @@ TEST(OneSignerGate, OtherNamelessAndRefusedPackagesAreNotCompared) {
   Report other_nameless = SignedBy(kOther);
   other_nameless.package_name = "";
   EXPECT_EQ(AfterOthers({nameless, other_nameless}), Lines());
-  // The signer of a refused file is only a claim, so it is not compared with other files.
+  // If the tool did not verify a file, the file only claims a signer. The gate does not compare
+  // this signer with those of other files.
   Report refused = SignedBy(kOther);
   refused.verdict = Verdict::kRefused;
   refused.items[0].is_verified = false;

@@ -7,8 +7,8 @@ using namespace simulator;
 namespace {
 
 // A package with a dex file, two libraries, a resource, an entry that the manifest does not list,
-// and its signature. Each entry has a different number of bytes, so a sum shows which entries it
-// counts.
+// and the signature file. Each entry has a different number of bytes, so a sum shows which entries
+// it counts.
 PackageFacts Package() {
   PackageFacts facts;
   facts.jar.manifest = Archive::ReadResult::kRead;

@@ -213,6 +213,7 @@ TEST(Warnings, UnlistedAndDamagedEntriesAreReported) {
   EXPECT_EQ(Warnings(facts), Lines({"unlisted-entries: 1 entry (1 byte)"}));
 }
 
+// A package is laid out if its libraries are extracted beside it, as an installer does.
 TEST(Warnings, EntriesThatAreNotLaidOutAreReported) {
   RunRecord run;
   run.not_laid_out = {"lib/a.so"};

@@ -1,8 +1,10 @@
 // The platform zip library as in API level 27: names are ZipString, handles are void*, and a
-// missing filter is a null pointer. The preset `zipstring` finds this header instead of the
-// library's own, so that the tool and its tests are built and run with this generation, too.
+// missing filter is a null pointer. With the preset `zipstring`, the compiler finds this header
+// instead of the library's own. The tool and its tests are then built and run with this older
+// interface.
 //
-// zipstring_library.cpp defines only the parts that differ, on top of the installed library.
+// zipstring_library.cpp defines only the parts that differ from the installed library, and calls
+// that library.
 #pragma once
 
 #include <sys/types.h>
@@ -61,6 +63,6 @@ int32_t ProcessZipEntryContents(ZipArchiveHandle archive, ZipEntry* entry,
 
 int GetFileDescriptor(ZipArchiveHandle archive);
 
-// Equal in both generations: the installed library's own functions.
+// Equal in both interfaces: the installed library's own functions.
 void EndIteration(void* cookie);
 const char* ErrorCodeString(int32_t error_code);
