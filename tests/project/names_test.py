@@ -1,6 +1,6 @@
 #!/usr/bin/env python3
 """Checks names in the docs. The named tests, the linked files, and the files and functions that
-docs/architecture.md names must exist."""
+docs/architecture.md names must exist. Also checks how the names of tests begin."""
 
 import re
 import sys
@@ -14,6 +14,8 @@ NAMED = re.compile(r"`((?:\w+/)?[A-Z]\w+)\.(\*|[A-Z]\w+)`")
 DEFINED = re.compile(r"^TEST(?:_F|_P)?\(\s*(\w+),\s*(\w+)\)", re.M)
 INSTANTIATED = re.compile(r"INSTANTIATE_TEST_SUITE_P\(\s*(\w+),\s*(\w+),")
 PROJECT = re.compile(r"apktoolkit_add_project_test\((\w+) ")
+# A test's name begins with its subject, or with a verb whose subject is the suite.
+NO_SUBJECT = re.compile(r"(A|An|The|What|Whatever|Of|On|With|Without|By|In|For|That|When|Nothing|No|There|It)[A-Z0-9]")
 LINK = re.compile(r"\]\(([^)#:]+)(?:#[^)]*)?\)")
 
 PAGE = ROOT / "docs/architecture.md"
@@ -56,6 +58,12 @@ def test_and_link_problems():
         yield f"only {count} tests are named: the pattern NAMED misses them"
 
 
+def test_name_problems():
+    for suite, test in sorted(tests_that_there_are()):
+        if NO_SUBJECT.match(test):
+            yield f"{suite}.{test}: the name must begin with a subject or a verb (CONTRIBUTING.md, What a change needs)"
+
+
 def function_problems():
     text = PAGE.read_text()
     places = STOP.findall(text) + ANSWER.findall(text)
@@ -76,5 +84,5 @@ def function_problems():
 
 
 if __name__ == "__main__":
-    sys.exit(report([*test_and_link_problems(), *function_problems()],
-                    "the page named above: it must name only what exists"))
+    sys.exit(report([*test_and_link_problems(), *test_name_problems(), *function_problems()],
+                    "the test or the page named above: a page must name only what exists"))
