@@ -259,8 +259,9 @@ void AddGate(CLI::App* app, Options* options) {
       ->check(is_digest)
       ->allow_extra_args(false);
   app->add_flag("--werror", options->gate.refuses_warnings,
-                "Warnings count as refusals, and so does a\n"
-                "package that phones install for another signer");
+                "Warnings count as refusals. A package that\n"
+                "phones install for another signer is also\n"
+                "refused");
 }
 
 void AddOutput(CLI::App* app, Options* options) {
@@ -307,7 +308,7 @@ void AddRun(CLI::App* app, Options* options, std::string* runner) {
       ->type_name("N")
       ->check(CLI::Range(1, 1024).description(""));
   app->add_option("--timeout", options->run.timeout,
-                  "Stop the tool if it takes longer for a file\n"
+                  "Stop the tool if a file takes longer than this\n"
                   "[default: 30]")
       ->type_name("SECONDS")
       ->check(CLI::Range(0.001, 1e6).description(""))
@@ -328,7 +329,7 @@ void AddRun(CLI::App* app, Options* options, std::string* runner) {
 void AddVerify(CLI::App* app, Options* options) {
   CLI::Option* const verify = app->add_flag("--verify", options->verify,
                                             "Sign nothing. Run the apktoolkit-verify beside\n"
-                                            "this program: it asks the kernel which FILEs it\n"
+                                            "this program: it asks which FILEs the kernel\n"
                                             "trusts");
   for (const char* name : {"--signer", "--werror", "--strict", "--recursive", "--quiet",
                            "--verbose", "--html", "--junit", "--sarif"}) {

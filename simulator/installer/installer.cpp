@@ -33,15 +33,14 @@ Judgement GaveUp(const std::string& why) { return {Judgement::State::kGaveUp, wh
 }  // namespace
 
 std::optional<std::string> Installer::Missing() const {
-  constexpr char kInstall[] = ": apt-get install default-jre-headless libapksig-java";
+  constexpr char kInstall[] =
+      " is missing; run apt-get install default-jre-headless libapksig-java";
   if (access(options_.program.c_str(), R_OK) != 0) {
-    return "there is no " + options_.program +
-           ": build it where default-jdk-headless and libapksig-java are installed";
+    return options_.program +
+           " is missing; build it where default-jdk-headless and libapksig-java are installed";
   }
-  if (access(kVerifierLibrary, R_OK) != 0) {
-    return std::string("there is no ") + kVerifierLibrary + kInstall;
-  }
-  if (!HasProgram("java")) return std::string("there is no java") + kInstall;
+  if (access(kVerifierLibrary, R_OK) != 0) return std::string(kVerifierLibrary) + kInstall;
+  if (!HasProgram("java")) return std::string("java") + kInstall;
   return {};
 }
 

@@ -41,7 +41,7 @@ std::vector<DrawnPart> DrawBar(const Protection& protection, uint64_t file_size)
        0,
        0,
        0},
-      {"unlisted", kUnlistedWord, "no digest in the manifest: anyone may have changed them", true,
+      {"unlisted", kUnlistedWord, "no digest in the manifest: anyone can change them", true,
        protection.unlisted, 0, 0, 0},
       {"signature", "the signature itself", "manifest, signature files and their blocks", true,
        protection.signature, 0, 0, 0},

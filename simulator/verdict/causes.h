@@ -235,7 +235,7 @@ inline constexpr Cause kCertificateDigest = {"certificate-digest", Group::kSigna
     "21 for every RSA key, in JDK 17 for keys of more than 3072 bits."};
 inline constexpr Cause kCertificateChanged = {"certificate-changed", Group::kSignature,
     Severity::kRefused, ChainLink::kCertificate, "`RSA could not verify certificate`",
-    "its certificate does not carry a signature by its own key",
+    "its certificate is not signed by its own key",
     "Sign the package again; if the error appears again, make a new certificate for the key."};
 inline constexpr Cause kSignedAttributes = {"signed-attributes", Group::kSignature,
     Severity::kRefused, ChainLink::kSignatureFile, "`RSA could not verify data`", "its signature "
@@ -292,7 +292,7 @@ inline constexpr Cause kKernelRefused = {"kernel-refused", Group::kKernel, Sever
     "The file was good. docs/guide.md, \"When the kernel refuses\", says where to look."};
 inline constexpr Cause kIntegrityZero = {"integrity-zero", Group::kKernel, Severity::kRefused,
     ChainLink::kNone, "`VELT can't sign a`",
-    "the tool's own integrity value settled at 0, so the tool may not sign", "The file was good. "
+    "the tool's own integrity value settled at 0, so the tool is not allowed to sign", "The file was good. "
     "Check the domain that starts the tool: the tool's value must be neither 0 nor ffffffff."};
 inline constexpr Cause kIntegrityMissing = {"integrity-missing", Group::kKernel, Severity::kRefused,
     ChainLink::kNone, "`VELT can't sign a`",
@@ -341,8 +341,8 @@ inline constexpr Cause kLibraryNotInstalled = {"library-not-installed", Group::k
     "there is nothing to do. To extract the libraries of all processors, use --install=all."};
 inline constexpr Cause kLibraryNotLaidOut = {"library-not-laid-out", Group::kLibrary,
     Severity::kNothing, ChainLink::kNone, "`Can't open file`",
-    "it is for another processor than the phone's (--install=all extracts the libraries of all "
-    "processors)",
+    "it is for another processor than the phone's (--install=all extracts those for 32-bit and "
+    "64-bit Arm)",
     "Nothing to do: phones install the libraries of one processor."};
 inline constexpr Cause kLibraryInSubdirectory = {"library-in-subdirectory", Group::kLibrary,
     Severity::kAbsent, ChainLink::kNone, "`Can't open file`",

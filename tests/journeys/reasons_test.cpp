@@ -194,12 +194,12 @@ TEST_F(Reason, IntegrityValueOf0IsReported) {
   EXPECT_EQ(
       Told(8, {"--integrity", "0"}),
       Lines({"REFUSED  base.apk",
-             "  ✗ package                not signed: the tool's own integrity value settled "
-             "at 0, so the tool may not sign",
-             "  ✗ lib/arm64/libvault.so  not signed: the tool's own integrity value settled "
-             "at 0, so the tool may not sign",
-             "  ✗ lib/arm/libvault.so    not signed: the tool's own integrity value settled "
-             "at 0, so the tool may not sign",
+             "  ✗ package                not signed: the tool's own integrity value settled at "
+             "0, so the tool is not allowed to sign",
+             "  ✗ lib/arm64/libvault.so  not signed: the tool's own integrity value settled at "
+             "0, so the tool is not allowed to sign",
+             "  ✗ lib/arm/libvault.so    not signed: the tool's own integrity value settled at "
+             "0, so the tool is not allowed to sign",
              "      The file was good. Check the domain that starts the tool: the tool's value",
              "      must be neither 0 nor ffffffff.",
              "  ✓ key                    registered for com.example.vault", "  signer", "-> 1"}));

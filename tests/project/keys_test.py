@@ -61,4 +61,4 @@ def jdk_problems():
 
 
 if __name__ == "__main__":
-    sys.exit(report([*page_problems(), *jdk_problems()], "the command on the page that is named"))
+    sys.exit(report([*page_problems(), *jdk_problems()], "correct the command on the page, or the page's text about the JDK"))

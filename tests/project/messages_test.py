@@ -63,7 +63,7 @@ GROUPS = {"kNotLookedAt": "The tool did not look at the file",
           "kSignature": "A package's signature", "kKernel": "The kernel", "kLibrary": "A library",
           "kKey": "The key", "kTool": "The tool itself",
           "kInstaller": "The installer of the phones",
-          "kGate": "The gate: demands in addition to the phone's answer", "kWarning": "Warnings"}
+          "kGate": "Demands of --signer and --werror, and of one signer for each package", "kWarning": "Warnings"}
 
 # Groups with causes that need not name a link of the chain (ChainLink). reasons_problems() has the
 # other exceptions.

@@ -127,7 +127,7 @@ TEST_F(ReadFileTest, FileAsLargeAsTheMachinesMemoryIsNotTried) {
   const std::string path = MakeFile("");
   ASSERT_EQ(0, truncate(path.c_str(), sysconf(_SC_PHYS_PAGES) * sysconf(_SC_PAGESIZE)));
   kernel.mmap = [](size_t) -> void* {
-    ADD_FAILURE() << "a kernel that promises any memory would be believed";
+    ADD_FAILURE() << "the size is not compared with the memory of the machine";
     return MAP_FAILED;
   };
   ExpectNoSize(path);

@@ -144,13 +144,13 @@ TEST(InstallerProcess, IsReportedOnceWhenItIsMissing) {
   const ProcessResult without = run("--installer=auto");
   EXPECT_EQ(without.status, 0);
   EXPECT_EQ(without.errors,
-            "apktoolkit-sim: no phone's installer was asked: there is no java: apt-get install "
+            "apktoolkit-sim: no phone's installer was asked: java is missing; run apt-get install "
             "default-jre-headless libapksig-java\n");
   const ProcessResult required = run("--installer=required");
   EXPECT_EQ(required.status, 3);
   EXPECT_EQ(required.output, "");
   EXPECT_EQ(required.errors,
-            "apktoolkit-sim: there is no java: apt-get install default-jre-headless "
+            "apktoolkit-sim: java is missing; run apt-get install default-jre-headless "
             "libapksig-java\n");
   EXPECT_EQ(run("--installer=off").errors, "");
 }

@@ -158,7 +158,7 @@ TEST(KernelStandIn, HidesItsDescriptorsFromTheTool) {
 }
 
 TEST(KernelStandIn, WorksWithFewDescriptors) {
-  if (AreProgramsEmulated()) GTEST_SKIP() << "the emulator needs more";
+  if (AreProgramsEmulated()) GTEST_SKIP() << "the emulator needs more descriptors";
   const Probe probe({"sign 3 0000", "register 3 name ab", "open /"});
   Lines command = {"sh", "-c", "ulimit -n 10 && exec \"$@\"", "sh"};
   for (const std::string& word : {SimulatorPath(), std::string("--json"), std::string("--tool"),

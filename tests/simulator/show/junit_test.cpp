@@ -75,9 +75,9 @@ TEST(Junit, HasACaseForEachFileAndCountsThem) {
 
 TEST(Junit, SaysThatTheInstallerWasNotAsked) {
   Report unasked = GoodReport("a.apk");
-  unasked.installer = {Judgement::State::kMissing, "there is no java", {}};
+  unasked.installer = {Judgement::State::kMissing, "java is missing", {}};
   EXPECT_NE(ReadByPython(XmlOf({unasked}))
-                .find("system-out [] \"warning: no phone's installer was asked: there is no java"),
+                .find("system-out [] \"warning: no phone's installer was asked: java is missing"),
             std::string::npos)
       << XmlOf({unasked});
 }

@@ -125,11 +125,11 @@ TEST(Sarif, FileThatWasNotJudgedIsAnErrorAndTheRunWasNotSuccessful) {
     EXPECT_FALSE(log["runs"][0]["artifacts"][0].contains("hashes"));
   }
   Report unasked = Good("a.apk");
-  unasked.installer = {Judgement::State::kMissing, "there is no java", {}};
+  unasked.installer = {Judgement::State::kMissing, "java is missing", {}};
   EXPECT_EQ(LogOf({unasked, unasked})["runs"][0]["invocations"],
             Json::parse(R"([{"executionSuccessful": true, "toolExecutionNotifications": [
                 {"level": "warning", "message":
-                    {"text": "no phone's installer was asked: there is no java"}}]}])"));
+                    {"text": "no phone's installer was asked: java is missing"}}]}])"));
   Report refused = Good("a.apk");
   refused.verdict = Verdict::kRefused;
   refused.items = {RefusedFor(&cause::kToolError, "a")};
