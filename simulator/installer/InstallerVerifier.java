@@ -172,10 +172,10 @@ public final class InstallerVerifier {
     }
 
     // Returns the verifier's answer for these levels. Phones of API 30 and later require v2 if the
-    // app targets 30 or later. The verifier checks this only if the range includes the app's target
-    // level. If the package has neither v3 nor v3.1, a range that ends at 30 or later is therefore
-    // verified without an upper end. This changes no other answer. With v3 or v3.1 it could,
-    // because their signers may be for some levels only.
+    // app targets 30 or later. The verifier checks this only if the range ends at the app's target
+    // level or later. If the package has neither v3 nor v3.1, a range that ends at 30 or later is
+    // therefore verified without an upper end. This changes no other answer. With v3 or v3.1 it
+    // could change other answers, because a signer of these schemes can be for some levels only.
     private static Range verify(DataSource source, int first, int last, boolean hasNewer)
             throws Exception {
         if (first >= KNOWS_V31 && !hasMethod(ApkVerifier.Result.class, "isVerifiedUsingV31Scheme")

@@ -40,7 +40,8 @@ std::vector<std::string> OwnerFacts(const Report& report, const char* ellipsis);
 // The JAR signer and the key, such as "CN=Vault, RSA-2048, key 98302ce8…f64646".
 std::string SignerText(const Report& report, const char* ellipsis);
 
-// Names the signer for whom phones install the package. Empty unless the verdict is kOtherSigner.
+// Names the signer whom phones record as the package's signer, if this is not the JAR signer. Empty
+// unless the verdict is kOtherSigner.
 std::string OtherOwnerText(const Report& report);
 
 // The texts of the warnings that have the severity kAlarm.
@@ -54,8 +55,8 @@ std::string DecisiveReason(const Report& report);
 std::string MissingInstaller(const Report& report);
 
 // The facts after the file's name in the verdict's line, in this order: the decisive reason or, if
-// nothing was refused, OwnerFacts; the command line's refusal of the signer, unless it is the
-// decisive reason; the alarms; the number of all warnings.
+// nothing was refused, OwnerFacts; the gate's refusals of the signer (gate.h), except the decisive
+// reason; the alarms; the number of all warnings.
 std::vector<std::string> HeadFacts(const Report& report, const char* ellipsis);
 
 // The mark before a line.
@@ -95,7 +96,7 @@ std::string TextOf(const Link& link);
 // Label and value for each fact. Except for the modulus, the labels are those of apksigner. One
 // search then finds a fact in the outputs of both programs.
 using Rows = std::vector<std::pair<std::string, std::string>>;
-// The facts of a certificate, as readers other than the tool find them.
+// The facts of a certificate, as libcrypto reads it. The tool has its own parser.
 Rows CertificateRows(const CertificateFacts& certificate);
 // The facts of the JAR signature: its certificate, and the digest of the key for the kernel.
 Rows SignerRows(const Report& report);

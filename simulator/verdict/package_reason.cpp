@@ -26,8 +26,9 @@ std::string FirstSignatureFile(const JarSignatureFacts& jar);
 
 }  // namespace
 
-// An encrypted entry is the reason even if the log has an error. Otherwise the first log line that
-// names a failed check decides. The log has the checks in the order in which the tool makes them.
+// An encrypted entry is the reason even if the log has an error. Otherwise a refused classes.dex is
+// the reason. Otherwise the first log line that names a failed check decides. The log has the
+// checks in the order in which the tool makes them.
 Reason WhyRefused(const RunRecord& run, const PackageFacts& facts) {
   const Lines& errors = run.opening_errors;
   const JarSignatureFacts& jar = facts.jar;

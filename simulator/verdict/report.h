@@ -18,7 +18,7 @@ namespace simulator {
 
 enum class Verdict {
   kSigned,
-  kOtherSigner,  // signed, but phones install it for another signer than the kernel's
+  kOtherSigner,  // signed, but phones install it for another signer than the JAR signer
   kTrustedJar,
   kPartlySigned,
   kNotInstallable,  // something was signed, but not all phones install the package
@@ -64,8 +64,9 @@ struct Item {
                       // package or JAR for which it is registered
   std::string entry;  // of a library: its entry in the package
   ItemState state;
-  Reason reason;             // a null cause if the state is kDone
-  bool is_verified = false;  // a library: its bytes match the manifest; a package: it verified
+  Reason reason;  // a null cause if the state is kDone
+  // A package: the tool verified it. A library: its bytes match the manifest.
+  bool is_verified = false;
 };
 
 // The key of the JAR signature, as the kernel and the tool know it.
@@ -131,8 +132,8 @@ struct Report {
 // verdict, else the first refused item. Null if nothing was refused.
 const Item* DecisiveItem(const Report& report);
 
-// The newest phones that install the package can install it for a signer other than the JAR signer.
-// Returns such a signer, or null if there is none. Reads only the signer and the key of the report.
+// Returns the signer for whom the newest phones that install the package install it, if this is not
+// the JAR signer. Otherwise returns null. Reads only the signer and the key of the report.
 const CertificateFacts* OtherSigner(const Judgement& judgement, const Report& report);
 
 // True for an item of the tool's own run. All other items are about the phones' installer or

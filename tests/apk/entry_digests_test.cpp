@@ -221,8 +221,8 @@ TEST(EntryDigests, EarlierManifestDoesNotAffectTheNext) {
   }
 }
 
-// The third section is still in memory, after the end of the text and in the former contents of the
-// table. It must not be listed.
+// The third section is still in memory: after the end of the new text, and in the memory that the
+// table of ManifestSections used before. It must not be listed.
 TEST(EntryDigests, SectionAfterTheEndOfTheTextIsNotListed) {
   const std::string two = Section("a", "1") + Section("b", "2");
   const std::string whole = two + Section("c", "3");

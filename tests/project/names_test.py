@@ -85,4 +85,4 @@ def function_problems():
 
 if __name__ == "__main__":
     sys.exit(report([*test_and_link_problems(), *test_name_problems(), *function_problems()],
-                    "the test or the page named above: a page must name only what exists"))
+                    "correct the test or the page named above: a page must name only what exists"))

@@ -124,8 +124,8 @@ class ChangedLibrary : public testing::Test {
 
 TEST_F(ChangedLibrary, UnchangedLibraryIsSignedAfterOneDigest) { ExpectSigned(1); }
 
-// --- Touched, with unchanged bytes. One test for each way in which an installer may finish its
-// work.
+// --- Touched, with unchanged bytes. Each test runs once for each way in which an installer may
+// finish its work.
 
 class TouchedLibrary : public ChangedLibrary, public testing::WithParamInterface<const char*> {
  protected:
@@ -235,6 +235,8 @@ TEST_F(ChangedLibrary, IsRefusedAtOnceIfExchangedForADirectory) {
   before_second_open_ = [this] { Link("lib"); };
   ExpectRefused(1);
 }
+
+// --- The library stays a regular file with the same bytes, or has no first descriptor.
 
 // A file system may give a removed file's inode number to the next file. If that file has the same
 // size, and times of the same clock tick, it looks like the file that was read.
