@@ -1,12 +1,12 @@
-// apktoolkit-all DIRECTORY LIST: signs every installed package after an update of the system. The
-// file LIST has a line "DIGEST[,DIGEST]... PATH" for each package. The digests name the signers
-// that the package manager knows (SignerDigests.java). DIRECTORY contains apktoolkit,
+// apktoolkit-all DIRECTORY LIST: signs the installed packages after an update of the system. The
+// file LIST has a line "DIGEST[,DIGEST]... PATH" for each file of each package. The digests name
+// the signers that the package manager knows (SignerDigests.java). DIRECTORY contains apktoolkit,
 // apktoolkit-bound and apktoolkit-verify, for example /system/bin. The program prints the outcome
 // for each package.
 //
 // Files that the kernel already trusts are left out, so an interrupted run can be started again.
 // Exit status: 0 if all packages are trusted, 1 if some are not, 2 if the command line is wrong,
-// the list cannot be opened, or one of its lines is malformed.
+// the list cannot be opened or read to its end, or one of its lines is malformed.
 #include <algorithm>
 #include <cerrno>
 #include <cstdio>
@@ -22,7 +22,8 @@ constexpr int kAllTrusted = 0;
 constexpr int kNotAllTrusted = 1;
 constexpr int kWrongInput = 2;
 
-// Reads the next line without its line end. Returns false at the end of the file.
+// Reads the next line without its line end. Returns false at the end of the file (feof), or if the
+// file cannot be read.
 bool ReadLine(FILE* list, std::string* line) {
   char* text = nullptr;
   size_t size = 0;
@@ -71,6 +72,10 @@ int main(int argc, char* argv[]) {
     if (!HasTrust(outcome)) status = std::max(status, kNotAllTrusted);
     printf("%s: %s\n", package.path.c_str(), Describe(outcome));
     fflush(stdout);  // show progress at once
+  }
+  if (feof(list) == 0) {
+    fprintf(stderr, "apktoolkit-all: cannot read %s to its end\n", argv[2]);
+    status = kWrongInput;
   }
   fclose(list);
   return status;

@@ -175,4 +175,16 @@ TEST(ApktoolkitAll, NeedsADirectoryAndAReadableList) {
   EXPECT_EQ(run.errors, "apktoolkit-all: cannot open /nowhere/list: No such file or directory\n");
 }
 
+// A list that cannot be read must not look like a list whose packages are all trusted. A directory
+// can be opened, but not read.
+TEST(ApktoolkitAll, ListThatCannotBeReadGivesStatus2) {
+  const ProcessResult run = RunProcess({APKTOOLKIT_ALL_PATH, "/system/bin", "/"});
+  EXPECT_EQ(run.status, 2);
+  EXPECT_EQ(run.output, "");
+  EXPECT_EQ(run.errors, "apktoolkit-all: cannot read / to its end\n");
+  const ProcessResult empty = RunProcess({APKTOOLKIT_ALL_PATH, "/system/bin", "/dev/null"});
+  EXPECT_EQ(empty.status, 0);
+  EXPECT_EQ(empty.errors, "");
+}
+
 }  // namespace
