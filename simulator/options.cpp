@@ -260,8 +260,8 @@ void AddGate(CLI::App* app, Options* options) {
       ->allow_extra_args(false);
   app->add_flag("--werror", options->gate.refuses_warnings,
                 "Warnings count as refusals. A package that\n"
-                "phones install for another signer is also\n"
-                "refused");
+                "phones install for another signer than the JAR\n"
+                "signer is also refused");
 }
 
 void AddOutput(CLI::App* app, Options* options) {
@@ -338,8 +338,8 @@ void AddVerify(CLI::App* app, Options* options) {
   verify->option_text(" ");  // replaces the list of excluded options, which is too long for a line
 }
 
-// Returns the exit status if the command line has an unknown option. The message also helps a user
-// whose file has a name that begins with "-".
+// If the command line has an unknown option, prints a message and returns the exit status. The
+// message also helps a user whose file has a name that begins with "-".
 std::optional<int> NameUnknownOption(const CLI::App& app) {
   std::vector<std::string> unknown = app.remaining();
   unknown.erase(std::remove(unknown.begin(), unknown.end(), "--"), unknown.end());

@@ -64,7 +64,7 @@ const char* Describe(SignOutcome outcome) {
     case SignOutcome::kNoJarSigner:
       return "not trusted: it has no good JAR signature";
     case SignOutcome::kNotTrusted:
-      return "not trusted: see the log of apktoolkit for the reason";
+      return "not trusted: see the log of apktoolkit, or check that apktoolkit-verify runs";
     case SignOutcome::kTimedOut:
       return "not trusted: apktoolkit took too long and was killed";
     case SignOutcome::kOutOfMemory:

@@ -16,7 +16,7 @@ enum class Group {
   kLibrary,
   kKey,
   kTool,
-  kInstaller,  // a phone's installer does not install the package
+  kInstaller,  // a phone's installer does not install the package, or its verifier gave up
   kGate,       // the file does not meet a demand of the gate (gate.h), such as --signer
   kWarning,    // a fact that the user should check, even if everything was signed
 };
@@ -173,7 +173,7 @@ inline constexpr Cause kManifestUnreadable = {"manifest-unreadable", Group::kSig
     "Copy or build the package again; unzip -t names the damaged entry."};
 inline constexpr Cause kSignatureFileMissing = {"signature-file-missing", Group::kSignature,
     Severity::kRefused, ChainLink::kSignatureFile, "",
-    "there is no signature file: no entry META-INF/*.SF, in capitals", "Sign the package again."};
+    "there is no signature file META-INF/*.SF (in capital letters)", "Sign the package again."};
 inline constexpr Cause kSignatureFileUnreadable = {"signature-file-unreadable", Group::kSignature,
     Severity::kRefused, ChainLink::kSignatureFile, "", "its signature file %s cannot be extracted",
     "Copy or build the package again; unzip -t names the damaged entry."};
@@ -292,8 +292,9 @@ inline constexpr Cause kKernelRefused = {"kernel-refused", Group::kKernel, Sever
     "The file was good. docs/guide.md, \"When the kernel refuses\", says where to look."};
 inline constexpr Cause kIntegrityZero = {"integrity-zero", Group::kKernel, Severity::kRefused,
     ChainLink::kNone, "`VELT can't sign a`",
-    "the tool's own integrity value settled at 0, so the tool is not allowed to sign", "The file was good. "
-    "Check the domain that starts the tool: the tool's value must be neither 0 nor ffffffff."};
+    "the kernel set the tool's own integrity value to 0, so the tool is not allowed to sign", "The "
+    "file was good. Check the domain that starts the tool: the tool's value must be neither 0 nor "
+    "ffffffff."};
 inline constexpr Cause kIntegrityMissing = {"integrity-missing", Group::kKernel, Severity::kRefused,
     ChainLink::kNone, "`VELT can't sign a`",
     "the tool has no integrity value: /proc/self/integrity/value does not exist",
@@ -341,9 +342,8 @@ inline constexpr Cause kLibraryNotInstalled = {"library-not-installed", Group::k
     "there is nothing to do. To extract the libraries of all processors, use --install=all."};
 inline constexpr Cause kLibraryNotLaidOut = {"library-not-laid-out", Group::kLibrary,
     Severity::kNothing, ChainLink::kNone, "`Can't open file`",
-    "it is for another processor than the phone's (--install=all extracts those for 32-bit and "
-    "64-bit Arm)",
-    "Nothing to do: phones install the libraries of one processor."};
+    "its ABI was not chosen (--install=all chooses one for 32-bit and one for 64-bit Arm)",
+    "Nothing to do: phones install the libraries of one ABI."};
 inline constexpr Cause kLibraryInSubdirectory = {"library-in-subdirectory", Group::kLibrary,
     Severity::kAbsent, ChainLink::kNone, "`Can't open file`",
     "it is in a subdirectory of its ABI: installers do not extract it to %s, where the tool looks",
@@ -376,7 +376,7 @@ inline constexpr Cause kRegistrationRefused = {"registration-refused", Group::kK
     "libzu defines the code. Files that were signed stay signed."};
 inline constexpr Cause kRegistrationNoPath = {"registration-no-path", Group::kKey,
     Severity::kRefused, ChainLink::kNone, "`Can't get jar location`",
-    "its path cannot be read", "Check that /proc is mounted and can be read."};
+    "the kernel reports no path for the JAR", "Check that /proc is mounted and can be read."};
 
 // ---- The tool itself.
 inline constexpr Cause kToolKilled = {"tool-killed", Group::kTool, Severity::kRefused,
@@ -458,7 +458,7 @@ inline constexpr Cause kWeakKey = {"weak-key", Group::kWarning, Severity::kWarni
     "another signer."};
 inline constexpr Cause kDebugKey = {"debug-key", Group::kWarning, Severity::kWarning,
     ChainLink::kNone, "", "it is signed with a debug certificate (CN=Android Debug); each "
-    "workstation makes its own", "Sign a release with a release key."};
+    "workstation makes its own debug key", "Sign a release with a release key."};
 inline constexpr Cause kWeakDigest = {"weak-digest", Group::kWarning, Severity::kWarning,
     ChainLink::kNone, "", "SHA-1 or MD5 is in use: %s",
     "Sign it again with SHA-256: apksigner does so with --min-sdk-version 18. Certify the key of "

@@ -44,8 +44,8 @@ TEST_F(Reason, LibrariesOfAnotherProcessorAreNotLaidOut) {
   Take("apksigner-sha256-2048");
   Do("rm -r lib");
   const std::string other =
-      "nothing to sign: it is for another processor than the phone's (--install=all extracts those "
-      "for 32-bit and 64-bit Arm)";
+      "nothing to sign: its ABI was not chosen (--install=all chooses one for 32-bit and one "
+      "for 64-bit Arm)";
   EXPECT_EQ(
       Told(6, {"--install", "--strict"}),
       Lines({"SIGNED  base.apk" + ByRsa2048(), kSigned, "  ✓ lib/arm64/libvault.so  signed",

@@ -194,12 +194,12 @@ TEST_F(Reason, IntegrityValueOf0IsReported) {
   EXPECT_EQ(
       Told(8, {"--integrity", "0"}),
       Lines({"REFUSED  base.apk",
-             "  ✗ package                not signed: the tool's own integrity value settled at "
-             "0, so the tool is not allowed to sign",
-             "  ✗ lib/arm64/libvault.so  not signed: the tool's own integrity value settled at "
-             "0, so the tool is not allowed to sign",
-             "  ✗ lib/arm/libvault.so    not signed: the tool's own integrity value settled at "
-             "0, so the tool is not allowed to sign",
+             "  ✗ package                not signed: the kernel set the tool's own integrity "
+             "value to 0, so the tool is not allowed to sign",
+             "  ✗ lib/arm64/libvault.so  not signed: the kernel set the tool's own integrity "
+             "value to 0, so the tool is not allowed to sign",
+             "  ✗ lib/arm/libvault.so    not signed: the kernel set the tool's own integrity "
+             "value to 0, so the tool is not allowed to sign",
              "      The file was good. Check the domain that starts the tool: the tool's value",
              "      must be neither 0 nor ffffffff.",
              "  ✓ key                    registered for com.example.vault", "  signer", "-> 1"}));
@@ -290,8 +290,8 @@ TEST_F(Reason, RemovedSignatureIsReported) {
             "its signature file, is missing");
   Do("zip -q -d base.apk META-INF/CERT.SF");
   EXPECT_EQ(Told(2)[1],
-            "  ✗ package                not signed: there is no signature file: no entry "
-            "META-INF/*.SF, in capitals");
+            "  ✗ package                not signed: there is no signature file "
+            "META-INF/*.SF (in capital letters)");
 }
 
 TEST_F(Reason, DuplicateEntryIsReported) {
