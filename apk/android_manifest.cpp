@@ -72,10 +72,10 @@ bool Apk::ParseAndroidManifest(std::vector<uint8_t> bytes) {
 
 namespace {
 
-// Returns the element's attribute "package" in UTF-8. The result is empty if no such attribute has
-// a text, or if the text has only unpaired surrogates. `nameless` has the address of each text that
-// was converted before. This function is called only until a name is found, so these texts gave an
-// empty name. They are not converted again.
+// Returns the element's attribute "package" in UTF-8. The result is empty if getStrAttr returns an
+// empty text, or a text that has only unpaired surrogates. `nameless` has the address of each text
+// that was converted before. This function is called only until a name is found, so these texts
+// gave an empty name. They are not converted again.
 String8 ReadPackageName(const ResXMLParser& parser, std::set<const char16_t*>* nameless) {
   const Text name = getStrAttr(parser, "package");
   if (name.empty() || !nameless->insert(name.data()).second) return String8();

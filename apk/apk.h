@@ -64,8 +64,8 @@ class Apk {
   bool IsApk() const { return is_apk_; }
   // The package attribute of the Android manifest, UTF-8; may be empty.
   const std::string& GetPackageName() const { return package_name_; }
-  // The signer's RSA modulus, big-endian, without the leading zero byte of its INTEGER. Empty
-  // unless the signature verified.
+  // If the signature verified, the signer's RSA modulus: big-endian, without one leading zero byte.
+  // Otherwise empty.
   const std::vector<uint8_t>& GetManufacturerKey() const { return manufacturer_key_; }
   // The Android manifest asks for the secure-storage permission.
   bool IsSsPermissionRequired() const { return ss_permission_required_; }
@@ -83,7 +83,8 @@ class Apk {
   }
   void EndIteration(void* cookie) { ::EndIteration(cookie); }
 
-  // The steps in which Init verifies a package. Each returns true for success.
+  // The steps in which Init verifies a package, from InitCertSf to ParseAndroidManifest. Each
+  // returns true for success.
 
   // Finds the signature file (the first entry "META-INF/….SF" in the zip library's order), parses
   // it, and verifies its signature block ("RSA" in place of "SF"). Fails without a message if the
@@ -103,7 +104,8 @@ class Apk {
   bool VerifyData(const std::string& digest_name, const std::vector<uint8_t>& expected,
                   const std::vector<uint8_t>& data);
   // Reads the package name and the secure-storage permission from a compiled "AndroidManifest.xml".
-  // Returns false, and changes nothing, only if the bytes are not compiled XML at all.
+  // If the bytes are not compiled XML at all, returns false and changes nothing. Otherwise returns
+  // true.
   bool ParseAndroidManifest(std::vector<uint8_t> bytes);
 
   // True if the package verified, and its "classes.dex" has the digest that the manifest records. A
@@ -119,8 +121,9 @@ class Apk {
   // file was read. If `fd` is not -1, the bytes are read from `fd`.
   bool VerifyFileHash(const std::string& name, const std::string& path,
                       struct stat* state = nullptr, int fd = -1);
-  // True if `name` is the manifest's name or one of six fixed names of signature files and blocks.
-  // These entries need no digest in the manifest.
+  // True if `name` is "META-INF/MANIFEST.MF" or one of six fixed names of signature files and
+  // blocks. If the manifest records no digest for such a name, VerifyEntryHash and VerifyFileHash
+  // return true without reading the content.
   bool CanSkipValidation(const std::string& name);
 
  private:

@@ -115,10 +115,11 @@ class Parser {
   }
 
   // Deliberate: if a line break follows the colon directly, the cursor always moves to the second
-  // byte after the colon. If the line break is CR LF, that byte is the LF. If it is a lone CR or
-  // LF, that byte is the first byte of the next line, and then counts as the line break. A name on
-  // the next line loses its first byte. An empty line, or a continuation line with one space, is
-  // not recognised. Signing tools write CR LF. For other files, the result must not change.
+  // byte after the colon. If the line break is CR LF or LF CR, that byte is its second byte. If it
+  // is a lone CR or LF, that byte is the first byte of the next line, and then counts as the line
+  // break. A name on the next line loses its first byte. An empty line, or a continuation line with
+  // one space, is not recognised. Signing tools write CR LF. For other files, the result must not
+  // change.
   bool passColon() {
     const char next = byteAt(cursor_ + 1);
     if (next != ' ' && !IsLineBreak(next)) {
@@ -144,7 +145,8 @@ class Parser {
     value.length += line.length;
   }
 
-  // Returns the rest of the cursor's line. The cursor is then on the byte that ended the line.
+  // Returns the rest of the cursor's line. The cursor is then on the byte that ended the line, or
+  // at the end of the text.
   ManifestPiece readLine() {
     size_t end = cursor_;
     for (;; ++end) {

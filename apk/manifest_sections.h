@@ -92,7 +92,7 @@ class ManifestSections {
   void endSection();
 
  private:
-  // After a sort, add() sorts again only after at least this many bytes of text.
+  // Within a section, add() sorts again only after at least this many bytes of text.
   static constexpr size_t kLittleText = 1024;
 
   size_t openStart() const { return ends_.empty() ? 0 : ends_.back(); }

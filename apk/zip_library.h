@@ -2,9 +2,10 @@
 // releases.
 //
 // The library has two generations. Its functions accept names as `ZipString` up to API 29, and as
-// std::string_view later. In the tool, only this file depends on the difference. The library owns
-// archives, entries and cookies. Each int32_t result is one of the library's codes (0: success).
-// Nothing is logged.
+// std::string_view later. In the tool, only this file depends on the difference. The library
+// allocates archives and cookies. Its CloseArchive and EndIteration release them. The caller owns
+// each ZipEntry. Each int32_t result is one of the library's codes (0: success). The functions of
+// this file log nothing, but the library can log a failure.
 #pragma once
 
 #include <ziparchive/zip_archive.h>

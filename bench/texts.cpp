@@ -39,7 +39,8 @@ std::vector<uint8_t> Repeat(const MakePiece& make_piece) {
   return text;
 }
 
-// Returns one of the shortest possible names. The names of consecutive numbers are not sorted.
+// Returns a name of at most five characters. Numbers below 2^28 have different names. The names of
+// consecutive numbers are not sorted.
 std::string ShortName(size_t i) {
   std::string name;
   for (size_t rest = i * 2654435761U % (1U << 28); rest > 0; rest /= 64) {
@@ -120,7 +121,7 @@ struct Reader {
 
 constexpr Reader kReaders[] = {
     {"`ManifestMf::load` of 64 MiB", ReadManifest, kTexts, std::size(kTexts)},
-    {"`ParseAndroidManifest` of 25 to 57 MB", ReadAndroidManifest, kDocuments,
+    {"`ParseAndroidManifest` of 25 to 59 MB", ReadAndroidManifest, kDocuments,
      std::size(kDocuments)},
 };
 

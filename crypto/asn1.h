@@ -56,13 +56,15 @@ int asn1_get_next(const uint8_t* buf, size_t len, asn1_hdr* hdr);
 int asn1_get_next_bounded(const uint8_t* buf, size_t available, size_t bound, asn1_hdr* hdr);
 
 // Decodes the `len` bytes at `buf`, the contents of an OBJECT IDENTIFIER (X.690 §8.19). Empty
-// contents have no arcs. The low 32 bits of each arc are kept. Fails for contents that end within
-// an arc, and for a 21st arc. `oid` then contains the arcs before the fault.
+// contents have no arcs. The low 32 bits of each arc are kept. The first value, which encodes two
+// arcs, is cut to its low 64 bits before it is split. Fails for contents that end within an arc,
+// and for a 21st arc. `oid` then contains the arcs before the fault.
 int asn1_parse_oid(const uint8_t* buf, size_t len, asn1_oid* oid);
 
 // Reads a whole OBJECT IDENTIFIER element from the `len` bytes at `buf`. Sets `next` to the
 // position after the element, even if the read then fails because the contents are malformed. Also
-// fails for any other element and for empty contents, and then leaves `oid` and `next` unchanged.
+// fails for any other element, for a truncated element and for empty contents. In these three
+// cases, `oid` and `next` stay unchanged.
 int asn1_get_oid(const uint8_t* buf, size_t len, asn1_oid* oid, const uint8_t** next);
 
 // Writes the arcs as dotted text into the `size` bytes at `buf`. The text is cut to fit and ends

@@ -1,10 +1,10 @@
 // Multi-precision integers for the RSA public operation.
 //
 // A number owns its limbs. The limbs are allocated by malloc, and overwritten with zeros before
-// they are freed or replaced. Arguments must not be null. The same number may be passed as several
-// arguments of an operation only if the operation's comment allows it. Operations that allocate
-// return kMpiNoMemory if malloc fails. The number that receives the result is then in a valid
-// state. The functions log nothing.
+// they are freed or replaced. Unless an operation's comment allows it, arguments must not be null,
+// and the same number must not be passed as two of them. Operations that allocate return
+// kMpiNoMemory if malloc fails. The number that receives the result is then in a valid state. The
+// functions log nothing.
 #pragma once
 
 #include <cstddef>
@@ -53,7 +53,7 @@ using mpi_local = mpi_owner<mpi>;
 // unchanged.
 int mpi_grow(mpi* X, int nblimbs);
 
-// X = A. If X has more limbs than A needs, X keeps these limbs and they become zero.
+// X = A. X may be A. If X has more limbs than A needs, X keeps these limbs and they become zero.
 int mpi_assign(mpi* X, const mpi* A);
 
 // X = the unsigned big-endian number in the `len` bytes at `bytes`. An empty X gets only the limbs

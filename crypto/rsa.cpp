@@ -121,8 +121,9 @@ bool holds(const uint8_t* info, const uint8_t* prefix, size_t prefix_size, const
   return memcmp(info, prefix, prefix_size) == 0 && memcmp(info + prefix_size, digest, size) == 0;
 }
 
-// Deliberate: only MD5 is supported. A prefix that differs only in the algorithm's byte, such as
-// that of MD2 or MD4, is logged as invalid padding. Any other prefix is refused without a message.
+// Deliberate: only MD5 is supported. A prefix that differs from MD5's only in the algorithm's byte,
+// such as that of MD2 or MD4, is logged as invalid padding. A prefix that differs in another byte
+// is refused without a message.
 int check_md5(uint8_t* info, const uint8_t* md5) {
   const uint8_t algorithm = info[kMdAlgorithmIndex];
   info[kMdAlgorithmIndex] = 0;

@@ -171,9 +171,9 @@ bool ParseAlgorithm(Range* range, asn1_oid* oid, asn1_oid* params) {
 
 // Reads a Name (RFC 5280 §4.1.2.4). Stores the position after it in `next`. Returns 0 for success,
 // -3 for a missing SEQUENCE, -7 for a missing SET, and -8 for a missing or malformed attribute
-// type. Returns -1 if an attribute's value is missing or not universal. Also returns -1 if a value
-// that must be kept contains a NUL, or if kX509MaxAttributes values are already kept. The caller
-// returns -12 for every failure. `name` is empty after a failure.
+// type. Returns -1 if an attribute's value is missing or not universal. Also returns -1 for an
+// attribute of kAttributes if its value contains a NUL, or if `name` already has kX509MaxAttributes
+// attributes. The caller returns -12 for every failure. `name` is empty after a failure.
 int x509_parse_name(const uint8_t* buf, size_t len, x509_name* name, const uint8_t** next) {
   Range range = {buf, len};
   asn1_hdr hdr;
@@ -414,8 +414,8 @@ bool KeepAltName(const asn1_hdr& hdr, x509_name* name) {
   }
 }
 
-// Many programs read a text only up to its first NUL, and would see another text. A text with a NUL
-// is therefore refused, and the field becomes empty.
+// Many programs read a text only up to its first NUL, so they would see a shorter text. A text with
+// a NUL is therefore refused, and the field becomes empty.
 bool KeepText(const asn1_hdr& hdr, const uint8_t** text, uint64_t* length) {
   const bool good = !HoldsNul(hdr);
   *text = good ? hdr.payload : nullptr;
@@ -423,7 +423,8 @@ bool KeepText(const asn1_hdr& hdr, const uint8_t** text, uint64_t* length) {
   return good;
 }
 
-// Deliberate: the AlgorithmIdentifier here is not compared with the tbsCertificate's.
+// Deliberate: the signatureAlgorithm is not compared with the signature field of the
+// tbsCertificate.
 int ParseSignature(Range certificate, x509_certificate* cert) {
   if (!ParseAlgorithm(&certificate, &cert->signature_algorithm_oid,
                       &cert->signature_algorithm_params_oid)) {

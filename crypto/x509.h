@@ -36,8 +36,8 @@ struct x509_name_attribute {
 inline constexpr size_t kX509MaxAttributes = 20;
 
 // A distinguished name, with the alternative names from the certificate's extension. A missing part
-// is a null pointer with length 0. If there are several e-mail addresses, or several alternative
-// names of one kind, the last one is kept.
+// is a null pointer with length 0; a missing `rid` has no arcs. If there are several e-mail
+// addresses, or several alternative names of one kind, the last one is kept.
 struct x509_name {
   x509_name_attribute attributes[kX509MaxAttributes];  // in order of appearance
   uint64_t attribute_count;

@@ -64,7 +64,8 @@ class Installation {
   const std::string& directory() const { return directory_; }
   std::string package() const { return directory_ + "base.apk"; }
 
-  // Replaces the library by another file. PutBack() restores all replaced libraries.
+  // If `path` is one of the libraries, replaces it by another file. PutBack() restores all replaced
+  // libraries.
   void Exchange(const std::string& path) {
     const auto file = files_.find(std::filesystem::weakly_canonical(path).string());
     if (file == files_.end()) return;
@@ -88,7 +89,7 @@ Installation& TheInstallation() {
   return installation;
 }
 
-// The bytes that the process holds now, and their peak, while a run is measured.
+// The bytes that the measured run has allocated and not freed, and the peak of this number.
 std::atomic<bool> is_measured;
 std::atomic<size_t> held, most_held;
 
@@ -148,8 +149,8 @@ class Judge {
       return;
     }
     Require(payload == "2000" + Hex(DigestOf(Digest::kSha256, model_->key())),
-            "a payload is the digest of the signer's key");
-    Require(model_->is_good(), "only a good package and its libraries are signed");
+            "a payload that is not empty is the digest of the signer's key");
+    Require(model_->is_good(), "a key's digest is only for a good package and its libraries");
     if (is_package_file) return;
     const Bytes content = ContentOf(fd);
     Require(model_->AllowsLibrary(TheInstallation().directory(), PathOf(fd), content),

@@ -19,8 +19,8 @@ class PackageModel {
 
   // True if "AndroidManifest.xml" can be extracted from the archive.
   bool is_package() const { return is_package_; }
-  // True if the package is signed by `key`, its manifest and classes.dex (if there is one) have the
-  // signed digests, and "AndroidManifest.xml" is compiled XML.
+  // True if the package is signed with the key that key() returns, its manifest and classes.dex (if
+  // there is one) have the signed digests, and "AndroidManifest.xml" is compiled XML.
   bool is_good() const { return is_good_; }
   const Bytes& key() const { return key_; }
   // True if one of the archive's libraries is installed at `path`, for a package in `directory`

@@ -16,10 +16,9 @@ namespace ApkTools {
 namespace {
 
 // The starts of the lines that the tool's code logs for a refusal, and the reason that each line
-// gives. A refusal logs at most one of these lines, possibly twice, with one exception. The same
-// parser reads the signature file and the manifest, and logs "Parse manifest: " for both. For the
-// manifest, "Can't load manifest: " follows. The line that was logged last therefore gives the
-// reason.
+// gives. A refusal logs at most one of these lines, possibly twice. The exception is a manifest
+// that does not parse. The parser then logs "Parse manifest: ", as for a signature file, and its
+// caller logs "Can't load manifest: ". The line that was logged last therefore gives the reason.
 constexpr struct LoggedReason {
   const char* start;
   Reason reason;
@@ -105,8 +104,8 @@ namespace {
 
 // Returns the reason of a refusal. `logged` is the reason that the log gave, or kUnknown. The log
 // does not distinguish all cases, so the archive's entries are checked. The same line is logged if
-// "AndroidManifest.xml" is missing and if it cannot be extracted. No line is logged if the manifest
-// or the signature file is missing or cannot be extracted.
+// "AndroidManifest.xml" is missing and if it cannot be extracted. No line is logged if
+// "META-INF/MANIFEST.MF" or the signature file is missing or cannot be extracted.
 Reason ReasonOf(Apk& apk, Reason logged) {
   if (logged == Reason::kAndroidManifestUnreadable) {
     return HasEntry(apk, "AndroidManifest.xml", "") ? logged : Reason::kNoPackage;

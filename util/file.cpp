@@ -32,9 +32,10 @@ bool IsSameFile(const struct stat& before, const struct stat& after) {
 int OpenForReading(const char* path, int flags) {
   const int fd = open(path, O_RDONLY | O_NONBLOCK | flags);
   if (fd >= 0 || errno != EWOULDBLOCK) return fd;
-  // A process holds a lease on the file. Without O_NONBLOCK, open waits until the lease ends.
-  // Meanwhile the holder could put a FIFO at the path, and open would then wait for a writer. The
-  // file is therefore not opened by its path again, but through an O_PATH descriptor.
+  // A process holds a lease on the file. An open without O_NONBLOCK waits until the lease ends. But
+  // if a FIFO was put at the path meanwhile, this open would wait for a writer. The path is
+  // therefore opened with O_PATH, which does not wait. If it leads to a regular file, that file is
+  // opened for reading through the O_PATH descriptor.
   const ScopedFd pinned(open(path, O_PATH | O_CLOEXEC));
   struct stat state = {};
   if (pinned.get() < 0 || fstat(pinned.get(), &state) != 0 || !S_ISREG(state.st_mode)) return -1;

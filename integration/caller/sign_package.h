@@ -4,9 +4,9 @@
 // Call SignPackage during an install when the package has its final path and its native libraries
 // are beside it. It must be called before any code of the package is run, mapped, or compiled ahead
 // of time (dexopt). From the call on, nobody may write to the package or beside it. The caller must
-// not hold a lock: the call may take as long as the limits allow. After an update of the system,
-// the kernel can refuse to trust files that it signed before. SignPackage must therefore be called
-// again for every installed package (main.cpp).
+// not hold a lock: the call runs up to three programs in turn, and each run can take the whole time
+// limit. After an update of the system, the kernel can refuse to trust files that it signed before.
+// SignPackage must therefore be called again for every installed package (main.cpp).
 #pragma once
 
 #include <string>
@@ -15,7 +15,8 @@
 
 struct InstalledPackage {
   std::string path;
-  // The package manager's signers, from SignerDigests.java: "DIGEST[,DIGEST]...", or empty.
+  // The package manager's signers, from SignerDigests.java: "DIGEST[,DIGEST]...", or empty if no
+  // signer has an RSA key.
   std::string signer_digests;
 };
 
@@ -24,7 +25,7 @@ enum class SignOutcome {
   kTrusted,
   kOtherSigner,  // the package manager does not know the JAR signer; apktoolkit was not run
   kNoJarSigner,  // the package has no good JAR signature; apktoolkit was not run
-  kNotTrusted,   // any other reason; if apktoolkit ran, its log has the reason
+  kNotTrusted,   // any other reason; if apktoolkit refused the package, see its log
   kTimedOut,     // apktoolkit or apktoolkit-bound was killed at the time limit
   kOutOfMemory,  // apktoolkit or apktoolkit-bound aborted, as it does at the memory limit
   kCannotBeRun,  // apktoolkit or apktoolkit-bound is missing or cannot be started

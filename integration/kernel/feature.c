@@ -1,9 +1,9 @@
 // SPDX-License-Identifier: GPL-2.0-only OR Apache-2.0
 /*
  * The file-integrity feature on an ordinary kernel, only for tests. It is the smallest feature that
- * apktoolkit works with. It is NOT for a product: a task that can read a regular file can have it
- * signed, and a parameter sets the integrity value of every task (docs/porting.md explains what a
- * product needs).
+ * apktoolkit works with. It is NOT for a product: a task that can read a regular file can make the
+ * kernel sign it, and a parameter sets the integrity value of every task (docs/porting.md explains
+ * what a product needs).
  *
  *   fcntl(fd, 1124, payload)   signs: keeps the payload, and the SHA-256 digest of the file's
  *                              bytes, in an extended attribute of the file

@@ -32,8 +32,8 @@ constexpr int kOtherSigner = 3;
 constexpr int kNoJarSigner = 4;
 constexpr int kNotStarted = 5;
 
-// Returns the digest of the signer's key. The tool's payload has the same digest. Returns an empty
-// text if the file cannot be opened, is not a package, or has no good JAR signature.
+// Returns the digest of the signer's key. The tool passes the same digest to the kernel. Returns an
+// empty text if the file cannot be opened, is not a package, or has no good JAR signature.
 std::string JarSigner(const char* file) {
   const ScopedFd fd(OpenForReading(file, O_CLOEXEC));
   if (fd.get() < 0) return {};

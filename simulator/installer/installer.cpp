@@ -148,7 +148,7 @@ bool Receive(int fd, const Deadline& deadline, std::string* line) {
   while (line->size() < kLongest && !deadline.HasPassed()) {
     pollfd waiting = {fd, POLLIN, 0};
     if (poll(&waiting, 1, kNowAndThen) <= 0) continue;
-    // The caller holds its lock during this wait on purpose: files are judged one after the other.
+    // Judge holds its lock during this wait on purpose: files are judged one after the other.
     // NOLINTNEXTLINE(clang-analyzer-unix.BlockInCriticalSection)
     const ssize_t size = recv(fd, part.data(), part.size(), 0);
     if (size <= 0) return false;

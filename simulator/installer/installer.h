@@ -36,7 +36,8 @@ class Installer {
   Installer(const Installer&) = delete;
   Installer& operator=(const Installer&) = delete;
 
-  // Returns why the installer cannot be asked, and what to install; none if it can be asked.
+  // If a part of the installer's verifier is missing, returns which part, and what to install or
+  // build. Otherwise returns none.
   std::optional<std::string> Missing() const;
 
   // Asks the phones' installer about the file. The result is kNotAsked for a file that is not a

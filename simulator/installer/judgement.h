@@ -45,7 +45,7 @@ struct RangeJudgement {
 
 struct Judgement {
   enum class State {
-    kNotAsked,  // nobody asked, or the file is not a package
+    kNotAsked,  // nobody asked, or the file cannot be opened or is not a package
     kMissing,   // the verifier is not installed
     kGaveUp,    // the verifier gave no valid answer, or none in time
     kJudged,

@@ -109,8 +109,8 @@ PublicKey ReadKey(X509* certificate) {
   const int size = i2d_X509_PUBKEY(info, &der);
   const bssl::UniquePtr<uint8_t> owner(der);
   key.sha256 = Sha256Hex(Text(der, size));
-  // The result is null for a key that the library does not support, such as a key on an unknown
-  // curve.
+  // X509_get_pubkey returns null for a key that the library does not support, such as a key on an
+  // unknown curve.
   const bssl::UniquePtr<EVP_PKEY> parsed(X509_get_pubkey(certificate));
   if (parsed == nullptr) return key;
   key.bits = EVP_PKEY_bits(parsed.get());
@@ -180,7 +180,8 @@ std::string KeyKind(const ASN1_OBJECT* algorithm) {
   return facts.nid == NID_dsa ? "DSA" : facts.name;
 }
 
-// The result has the form of keytool's -sigalg, such as "SHA256withRSA", if the algorithm is known.
+// If the library knows the algorithm and its digest, the result has the form of keytool's -sigalg,
+// such as "SHA256withRSA". Otherwise it is the name from AlgorithmOf.
 std::string SignatureName(const ASN1_OBJECT* algorithm) {
   int digest = NID_undef;
   int key = NID_undef;

@@ -51,7 +51,7 @@ struct AlgorithmFacts {
 };
 
 AlgorithmFacts AlgorithmOf(const ASN1_OBJECT* algorithm);
-// Parses an AlgorithmIdentifier. The result is empty if it is malformed.
+// Parses an AlgorithmIdentifier. The result is empty if `der` is malformed.
 AlgorithmFacts ParseAlgorithm(std::string_view der);
 
 // The digest in lower-case hexadecimal.

@@ -1,6 +1,6 @@
-// The facts that the simulator finds in a file: its kind and, for a package, its signer, the
-// entries that the signature lists, and the libraries beside it. The facts explain the tool's
-// answer and decide nothing. The facts of a malformed part are missing.
+// The facts that the simulator finds in a file: its kind and, for a package, its signer, its
+// entries, and the libraries beside it. The facts explain the tool's answer. They never make a
+// refused file count as signed. The facts of a malformed part are missing.
 #pragma once
 
 #include <cstdint>
@@ -36,11 +36,11 @@ struct NewerSignerFacts {
 // A library lib/….so of the package, and the file at the place where the tool looks for it.
 struct LibraryFacts {
   std::string entry;  // its name in the package
-  // The path to which an installer extracts it, relative to the package's directory; empty: `entry`
-  // does not begin with the directory of an Arm ABI.
+  // The path at which the tool looks for the file, relative to the package's directory; empty:
+  // `entry` does not begin with the directory of an Arm ABI.
   std::string place;
   bool is_met = true;          // true if the tool reaches `entry`; a damaged entry stops it
-  int error = 0;               // errno of opening the file as the tool does; 0: it can be opened
+  int error = 0;               // errno of opening the file; 0: it can be opened, or no `place`
   bool has_directory = false;  // the file's directory exists
 };
 
@@ -62,7 +62,7 @@ struct PackageFacts {
   JarSignatureFacts jar;
   std::vector<NewerSignerFacts> newer;
   bool has_damaged_signing_block = false;
-  std::vector<std::string> too_long;  // the parts that were not read because they are too long
+  std::vector<std::string> too_long;  // parts not read: too long, or with overlapping strings
   std::vector<ListedEntry> entries;
   std::vector<std::string> missing;  // names in MANIFEST.MF that the archive does not have
   // In the order in which the tool reads their entries, damaged ones last.

@@ -43,7 +43,7 @@ struct JarSignatureFacts {
   // The first certificate; none if it cannot be parsed, or if the tool reads the key from another
   // certificate.
   std::optional<CertificateFacts> certificate;
-  // The first signer's identifier names a certificate other than the first one.
+  // The first signer's identifier does not name the first certificate.
   bool names_other_certificate = false;
 };
 

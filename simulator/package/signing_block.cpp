@@ -13,7 +13,7 @@ constexpr size_t kSizeField = 8;
 constexpr size_t kFooter = kSizeField + kMagic.size();
 
 // The limit for the signers of all schemes together. A block with more signers counts as damaged
-// here. Phones accept at most ten.
+// here. Phones accept at most ten v2 signers, and use one v3 signer.
 constexpr size_t kMostSigners = 16;
 
 // The known schemes. `id` identifies the scheme's pair in the block.

@@ -1,7 +1,8 @@
 // The signers of the schemes after JAR signing (v2, v3, v3.1). They are in the signing block, which
 // is between an archive's entries and its central directory. The block is found in the same way as
-// the platform finds it. Digests and signatures are not verified. A block with too many signers
-// (kMostSigners) counts as damaged. The certificates point into the caller's bytes.
+// the platform finds it. Digests and signatures are not verified. A block with more than 16 signers
+// (kMostSigners in signing_block.cpp) counts as damaged. The certificates point into the caller's
+// bytes.
 #pragma once
 
 #include <cstdint>

@@ -1,7 +1,7 @@
 // The journal of a simulated run: one JSON object per line, in the order of the events
 // (docs/journal.md describes it). Two kinds of code write to the journal: apktoolkit-sim, and the
 // stand-ins for libzu, the kernel and the log, which are libraries inside the tool's process. Each
-// line is one appending write, so the lines are in the order of the writes. This code needs no JSON
+// line is one appending write, so the lines are in the order of the writes. This code uses no JSON
 // library, because the stand-ins must not bring libraries into the tool's process.
 #pragma once
 

@@ -1,10 +1,10 @@
 // Simulates the two fcntl commands of the kernel's integrity feature, under both names that fcntl
 // has in the C library.
 //
-// This file, integrity_file.cpp, log.cpp and standard_output.cpp are one library, which is loaded
-// before all others. It replaces the functions by which the tool uses the phone's kernel and log.
-// Calls that do not concern the phone are passed, unchanged, to the function of the same name in a
-// library that is loaded later.
+// This file, integrity_file.cpp, log.cpp and standard_output.cpp are parts of one library, which is
+// loaded before all others. It replaces the functions by which the tool uses the phone's kernel and
+// log. Calls that do not concern the phone are passed, unchanged, to the function of the same name
+// in a library that is loaded later.
 #include <fcntl.h>
 #include <sys/mman.h>
 #include <sys/stat.h>

@@ -34,9 +34,10 @@ struct FileList {
 };
 
 // Lists the files of the command line and then those of the list, in their order. With
-// `is_recursive` a directory is replaced by the files below it with package names (IsPackageName),
-// sorted by their paths, byte by byte. Symbolic links to directories are followed if they are
-// named, but not if they are found below a directory. Empty names in a list are skipped.
+// `is_recursive` a directory is replaced by the files below it that have package names
+// (IsPackageName), sorted by their paths, byte by byte. Symbolic links to directories are followed
+// if they are named, but not if they are found below a directory. Empty names in a list are
+// skipped.
 //
 // Returns none on success, else the reason of the failure: the list cannot be read, has no names,
 // or has NUL bytes although its names end with line feeds.

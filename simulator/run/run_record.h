@@ -20,7 +20,7 @@ struct Attempt {
     kBegun,  // the tool began, and no result is known
     kSigned,
     kKernelRefused,
-    kNotAsked,     // the kernel was not asked, because the tool may not sign: see `integrity`
+    kNotAsked,     // `integrity` is the reason why the tool did not ask the kernel
     kNotVerified,  // a library that the tool refused: see `why`
     kVanished,     // a library that could not be opened again after its check
   };
@@ -60,7 +60,7 @@ struct RunRecord {
   Events events;  // all events, in order
   std::string file;
   std::string path;
-  std::string installed;  // the copy that Installation made: <install>/base.apk; empty: none
+  std::string installed;  // <install>/base.apk, made by Installation; empty: not made
   bool is_silent = true;  // the journal has no event of the tool before its exit
 
   std::vector<LogLine> opening_errors;  // logged before the tool began to sign
@@ -93,7 +93,7 @@ struct RunRecord {
   std::vector<std::string> not_laid_out;      // entries whose names no installer accepts
   std::vector<std::string> not_extracted;     // entries that cannot be extracted
 
-  // The path that the tool got.
+  // The path by which the events name the file.
   const std::string& PathForTool() const { return installed.empty() ? path : installed; }
 };
 

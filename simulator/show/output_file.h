@@ -26,8 +26,9 @@ class OutputFile {
   bool IsWanted() const { return !path_.empty(); }
   const char* option() const { return kind_.option; }
 
-  // Returns a reason not to write the file: it exists and is not of this kind, is one of `inputs`,
-  // or is the file that standard output or standard error goes to. Returns nothing otherwise.
+  // Returns a reason not to replace an existing regular file: it is one of `inputs`, it is the file
+  // that standard output or standard error goes to, or it is neither empty nor of this kind.
+  // Returns nothing otherwise.
   std::optional<std::string> Objection(const std::vector<std::string>& inputs) const;
   // True if this file and `other` are the same file, even under two names. False for devices and
   // pipes.

@@ -43,10 +43,10 @@ class Presenter {
   // the reason.
   void ShowAnswer(const RunRecord& run, const Report& report, const std::string& journal);
   void ShowProgress(const std::string& file, int seconds);
-  // Writes the summary, the page and the reports. `files` are all files of the command line. If the
-  // run was interrupted, the files that were not shown are errors in the reports for other
-  // programs. Returns the highest status of all files, or at least kCannotSimulate if an output
-  // failed.
+  // Writes the summary, the page and the reports. `files` are all files of the run, in the order in
+  // which they are shown. If the run was interrupted, the files that were not shown are errors in
+  // the reports for other programs. Returns the highest status of all files, or at least
+  // kCannotSimulate if an output failed.
   int Finish(const std::vector<std::string>& files);
   // Called instead of Show and Finish if no file can be simulated because of `problem`. The page
   // and the reports then have an error for each file. Returns the exit status.
@@ -83,7 +83,8 @@ class Presenter {
 // Prints `message`, an error, and returns `status`.
 int Complain(int status, const std::string& message);
 
-// Returns `status`, or at least kCannotSimulate if standard output could not be written.
+// If standard output could not be written and the run was not interrupted, prints an error and
+// returns at least kCannotSimulate. Otherwise returns `status`.
 int EndWith(int status);
 
 }  // namespace simulator

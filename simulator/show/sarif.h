@@ -32,7 +32,7 @@ class Sarif {
   // Adds the next file, in the order of the command line.
   void Add(const Report& report);
 
-  // Adds a failure of the run itself, such as another output that cannot be written.
+  // Adds a failure of the run itself, for example that the journal cannot be written.
   void AddProblem(const std::string& problem);
 
   // The whole log, in UTF-8.

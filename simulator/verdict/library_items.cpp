@@ -1,4 +1,4 @@
-// The items for a package's native libraries.
+// The report's items (Item in report.h) for a package's native libraries.
 #include <algorithm>
 #include <cerrno>
 #include <cstdio>
@@ -126,8 +126,8 @@ Reason WhyNotVerified(const Library& library, const RunRecord& run, const Packag
   return {is_changed_inside ? &cause::kLibraryChangedInside : &cause::kLibraryChanged, ""};
 }
 
-// The tool does not log why a file could not be opened. The simulator therefore opens the file as
-// well: `library.error` is the errno that the simulator got.
+// If the tool cannot open a library for the digest, the log does not say why. The simulator
+// therefore opens the file as well: `library.error` is the errno that the simulator got.
 Reason WhyNotThere(const LibraryFacts& library, const RunRecord& run, const PackageFacts& facts) {
   const int error = library.error;
   if (error == EACCES || error == EPERM) return {&cause::kLibraryNoPermission, ""};

@@ -44,7 +44,7 @@ Facts Read(const CompiledXml& xml) {
   return {apk.GetPackageName(), apk.IsSsPermissionRequired()};
 }
 
-// True if the element, inside a manifest, asks for the permission.
+// True if the element, inside a manifest, asks for the secure-storage permission.
 bool Asks(const std::string& element, const std::vector<XmlAttribute>& attributes) {
   CompiledXml xml;
   xml.Start("manifest", {Package("p")}).Element(element, attributes).End("manifest");
@@ -228,7 +228,7 @@ TEST(AndroidManifestAttribute, StringWithoutTextBeforeAnotherStringIsSkipped) {
 }
 
 // An attribute's raw value is its text in the source. The typed value was compiled from this text.
-// Only the typed value counts.
+// The raw value is read only if the type of the typed value is string.
 TEST(AndroidManifestAttribute, RawTextOfReferenceOrIntegerIsIgnored) {
   for (XmlAttribute attribute :
        {ReferenceAttribute("package", 0x7f010000), IntAttribute("package", 7)}) {
@@ -251,7 +251,8 @@ TEST(AndroidManifestAttribute, LoneStringWithoutTextCountsAsMissing) {
 }
 
 // ---- Unpaired surrogates. The platform drops them when it converts a text to UTF-8. The tool
-// converts only the package's name. It compares other texts as if they were converted.
+// converts only the package's name. It compares every other text with at most 16 unpaired
+// surrogates as if it were converted.
 
 const std::string kHigh = "\xED\xA0\x80", kLow = "\xED\xB0\x80";  // U+D800, U+DC00
 
@@ -379,8 +380,8 @@ TEST(AndroidManifestDocument, IsReadOrReportedIfCutToAnyLength) {
   EXPECT_LT(read, whole.size());
 }
 
-// Returns the document with `new_bytes` in place of the first `old_bytes`. The document must
-// contain `old_bytes`.
+// Returns the document with `new_bytes` in place of the first occurrence of `old_bytes`. The
+// document must contain `old_bytes`.
 Bytes Replaced(Bytes document, const Bytes& old_bytes, const Bytes& new_bytes) {
   const auto at = std::search(document.begin(), document.end(), old_bytes.begin(), old_bytes.end());
   EXPECT_NE(at, document.end());

@@ -47,7 +47,7 @@ PackageOptions WithoutDexListedBy(const std::string& text) {
   return options;
 }
 
-// ---- The flags after Init: one test for each step that Init can reach.
+// ---- The flags after Init. They depend on the step at which Init ends.
 
 TEST(ApkInit, AllFlagsAreFalseWithoutDescriptorAndPath) {
   LogCapture log;
@@ -212,6 +212,8 @@ TEST(ApkInit, CallersDescriptorStaysOpen) {
   static_cast<void>(Apk(file.fd()));  // constructed and destroyed
   EXPECT_NE(fcntl(file.fd(), F_GETFD), -1);
 }
+
+// ---- A second call of Init.
 
 TEST(ApkInit, SecondInitClearsTheFlags) {
   PackageOptions options = WithoutDex();

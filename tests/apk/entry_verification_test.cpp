@@ -123,7 +123,7 @@ TEST(IsGoodApk, PackageThatInitJudgedBadIsNotExamined) {
 
 TEST(IsGoodApk, DexWhoseHeadersDisagreeOnItsNameIsBad) {
   Package package = MakePackage();
-  package.Item("classes.dex").local_name = "Classes.dex";  // the two headers disagree
+  package.Item("classes.dex").local_name = "Classes.dex";  // only in the local header
   LogCapture log;
   OpenPackage open(package);
   EXPECT_FALSE(open.apk.IsGoodApk());
@@ -293,7 +293,8 @@ TEST(VerifyFileHash, FileThatCannotBeOpenedIsReported) {
   EXPECT_EQ(log.records(), Records({Error("Can't open file: /nowhere/libfoo.so\n")}));
 }
 
-// The digest is decoded first. The file is read even if the digest cannot be decoded.
+// The digest is decoded first. The file is read even if the digest cannot be decoded or is too
+// short.
 TEST(VerifyFileHash, FileIsReadEvenIfItsListedDigestIsBad) {
   for (const char* digest : {"not base64!", "====", "AAAA"}) {
     OpenPackage open(WithManifest(JarText::Manifest()

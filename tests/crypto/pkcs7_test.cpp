@@ -319,8 +319,9 @@ TEST(ProcessCertKey, ExponentThatIsNotAnIntegerIsReported) {
 }
 
 TEST(ProcessCertKey, ExponentMustBeInTheBlock) {
-  // The key ends after the exponent's header. The length in this header covers the rest of the
-  // block, and is not greater than the length of the modulus.
+  // The key ends after the exponent's header. The length in this header first covers exactly the
+  // rest of the block, and then one byte more. In both cases, the exponent's element is shorter
+  // than the modulus.
   SignatureBlock block =
       WithPublicKey(Concat({der::Sequence({der::Integer(Bytes(200, 0x77))}), {0x02, 0x81, 0x00}}));
   block.signer_infos = Bytes();

@@ -1,6 +1,6 @@
-// Tests elements that end beyond their containers. The bytes after the container would be valid as
-// the end of the element. A parser that used these bytes would therefore accept the certificate.
-// Also tests bytes after the last element that is read.
+// Tests elements that end beyond their containers. In most tests, the bytes after the container
+// would be valid as the end of the element. A parser that used these bytes would therefore accept
+// the certificate. Also tests bytes after the last element of a container.
 #include <gtest/gtest.h>
 
 #include "crypto/parsed_certificate.h"
@@ -183,8 +183,8 @@ TEST(X509TooLongElement, ElementsOfAnExtensionAreMinus15) {
   const Bytes value = der::OctetString(DigitalSignature());
   EXPECT_EQ(ResultOfExtensions({der::Sequence({der::Oid(kKeyUsage), value})}), 0);
   EXPECT_EQ(ResultOfExtensions({der::Sequence({der::Oid(kKeyUsage), RunningOn(value)})}), -15);
-  // The parser reads the header after the flag from the flag's own byte, 04. It therefore reads the
-  // OCTET STRING 04 04 03 02 05 a0.
+  // The parser reads the header after the critical flag (a BOOLEAN) from the flag's value byte, 04.
+  // It therefore reads the OCTET STRING 04 04 03 02 05 a0.
   const Bytes id = Concat({der::Oid(kKeyUsage), der::Boolean(4)});
   const Bytes whole = FromHex("04 03 02 05 a0");
   const Bytes cut = FromHex("04 03 02 05");

@@ -171,15 +171,15 @@ TEST(X509Name, MalformedNameIsMinus12) {
       FromHex("30 84 7f ff ff ff"),                                // runs past the end
       der::Sequence({der::Sequence({})}),                          // no SET
       der::Sequence({{0x31, 0x05}}),                               // a SET that runs past the end
-      der::Sequence({der::Context(17, {})}),                       // another class
+      der::Sequence({der::Context(17, {})}),                       // a [17] in place of the SET
       der::Sequence({der::Set({})}),                               // an empty SET
       der::Sequence({der::Set({der::Set({})})}),                   // no SEQUENCE in it
       der::Sequence({der::Set({der::Sequence({})})}),              // no type
       der::Sequence({der::Set({der::Sequence({value, value})})}),  // no type either
       der::Sequence({Rdn(kCommonName, Bytes())}),                  // no value
       der::Sequence({Rdn(kCommonName, {0x0c, 0x01})}),             // a value that runs past the end
-      der::Sequence({Rdn(kCommonName, der::ContextPrimitive(12, {'x'}))}),  // of another class
-      der::Sequence({Rdn("1.2.3", der::ContextPrimitive(12, {'x'}))}),      // of an unknown type
+      der::Sequence({Rdn(kCommonName, der::ContextPrimitive(12, {'x'}))}),  // a [12] as the value
+      der::Sequence({Rdn("1.2.3", der::ContextPrimitive(12, {'x'}))}),      // a [12], unknown type
   };
   for (const Bytes& name : cases) {
     Certificate certificate = Unsigned();

@@ -310,11 +310,11 @@ TEST(X509PublicKey, MalformedKeyInfoIsMinus14) {
       der::Set({algorithm, der::BitString({1})}),                         // no SEQUENCE
       FromHex("30 84 7f ff ff ff"),                                       // runs past the end
       der::Sequence({}),                                                  // no algorithm
-      der::Sequence({der::Set({}), der::BitString({1})}),                 // another element
-      der::Sequence({der::Sequence({}), der::BitString({1})}),            // without an OID
+      der::Sequence({der::Set({}), der::BitString({1})}),                 // SET as algorithm
+      der::Sequence({der::Sequence({}), der::BitString({1})}),            // algorithm without OID
       der::Sequence({algorithm}),                                         // no key
-      der::Sequence({algorithm, der::OctetString({1})}),                  // another element
-      der::Sequence({algorithm, der::ContextPrimitive(3, {1})}),          // another class
+      der::Sequence({algorithm, der::OctetString({1})}),                  // OCTET STRING as key
+      der::Sequence({algorithm, der::ContextPrimitive(3, {1})}),          // key of another class
       der::Sequence({algorithm, der::Element(der::kBitString, Bytes())})  // no contents
   };
   for (const Bytes& info : cases) {

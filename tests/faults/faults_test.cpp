@@ -120,13 +120,14 @@ bool IsExit0(const ToolEnd& ending) {
   return ending.how == ToolEnd::How::kExited && ending.value == 0;
 }
 
-// The expected grants, one text per run. The function's first call fails in the first run, its
-// second call in the second run, and so on. The comments in the tables below name these calls.
+// The expected grants for one function, one text per run. The function's first call fails in the
+// first run, its second call in the second run, and so on. Most comments in the tables below name
+// these calls.
 using Runs = std::vector<std::string>;
 using Table = std::map<std::string, Runs>;
 
-// Makes each call of the functions fail, one per run. One more run for each function chooses a call
-// that the tool never makes. `all` are the grants of a run without a fault.
+// Makes each call of the functions in `table` fail, one per run. One more run for each function
+// chooses a call that the tool never makes. `all` are the grants of a run without a fault.
 void ExpectRuns(Installed& file, const std::string& all, const Table& table) {
   for (const auto& [function, runs] : table) {
     for (size_t call = 1; call <= runs.size() + 1; ++call) {
@@ -169,7 +170,7 @@ TEST(FailedCalls, RemoveOnlyDependentGrantsOfAGoodPackage) {
               {"fcntl", {"PK", "PK", "LK"}},  // a copy of the library's descriptor; both signings
               {"readlink", {"PK", "LPK"}},    // the libraries' directory; a message
               {"fstatvfs", {"LPK"}},          // the file system then counts as writable
-              {"fgetxattr", {}}});            // only JARs have attributes
+              {"fgetxattr", {}}});            // the tool calls it only for JARs
 }
 
 TEST(FailedCalls, RemoveOnlyDependentGrantsOfATrustedJar) {
@@ -223,10 +224,11 @@ bool IsAbort(const ToolEnd& ending) {
   return ending.how == ToolEnd::How::kKilled && ending.value == SIGABRT;
 }
 
-// Makes each request for memory fail, one per run. A run may end with an abort because a C++
-// container gets no memory. The grants of such a run must be the first letters of `all`, and at
-// least as many as in each earlier run that aborted. In any other run, the tool and its libraries
-// handle the missing memory: the run must end normally, and its grants must be one of `ways`.
+// Makes each request for memory fail, one per run. A C++ container that gets no memory aborts, so a
+// run is allowed to end with an abort. The grants of such a run must be the first letters of `all`,
+// and at least as many as in each earlier run that aborted. In any other run, the tool and its
+// libraries handle the missing memory: the run must end normally, and its grants must be one of
+// `ways`. In the last run no request fails, and the grants must be `all`.
 void ExpectRunsWithoutMemory(Installed& file, const std::string& all,
                              const std::set<std::string>& ways) {
   constexpr int kMostCalls = 20000;

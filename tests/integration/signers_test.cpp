@@ -66,7 +66,8 @@ constexpr int kNotStarted = 5;
 // The signing block is the attacker's.
 class PackageWithTwoFaces : public testing::Test {
  protected:
-  // The package "openssl-cms-issued" is signed with the same key, "rsa-2048-other".
+  // The signing block is made with the key "rsa-2048-other". The golden package
+  // "openssl-cms-issued" is signed with this key, too.
   PackageWithTwoFaces() : apk_(directory_ / "base.apk") {
     const std::string victims = std::string(THREAT_PACKAGES) + "/foreign/base.apk";
     WriteFile(apk_, AddSigningBlock(ToBytes(ContentOf(victims)), "rsa-2048-other"));
@@ -127,7 +128,7 @@ TEST(Signers, OneOfSeveralIsEnough) {
   ExpectRun(DigestOfKey("openssl-cms-issued") + "," + DigestOfKey("apksigner-sha256-2048"), apk);
 }
 
-// From API level 28 on the package manager uses the new key. The JAR signature is made with the old
+// At API level 33, the package manager uses the new key. The JAR signature is made with the old
 // key.
 TEST(Signers, RetiredKeyIsNotASigner) {
   const std::string apk = Golden("rotated-key/base.apk");

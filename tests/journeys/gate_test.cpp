@@ -17,6 +17,7 @@ namespace {
 using Lines = std::vector<std::string>;
 using nlohmann::json;
 
+// The path of `name` in the directory of the packages that make_golden_packages makes.
 std::string Golden(const std::string& name) { return std::string(GOLDEN_PACKAGES) + "/" + name; }
 
 std::string Apk(const std::string& name) { return Golden(name) + "/base.apk"; }
@@ -127,7 +128,7 @@ TEST(Signer, UnexpectedSignerIsShownInTextAndJournal) {
   EXPECT_NE(item["text"].get<std::string>().find(PublicKeyDigest("rsa-2048")), std::string::npos);
 }
 
-// For phones of API 28 and later, the signer of the package rotated-key has the key rsa-2048-other,
+// For the newest phones, the signer of the package rotated-key has the key rsa-2048-other,
 // but the kernel gets the key rsa-2048.
 TEST(Signer, KeyOfANewerSchemeMustBeExpectedToo) {
   const Lines first = {"--signer", ModulusDigest("rsa-2048")};

@@ -15,6 +15,7 @@ namespace {
 using Lines = std::vector<std::string>;
 using nlohmann::json;
 
+// The path of `name` in the directory of the packages that make_golden_packages makes.
 std::string Golden(const std::string& name) { return std::string(GOLDEN_PACKAGES) + "/" + name; }
 
 ProcessResult Run(const std::string& name, Lines options) {
@@ -98,7 +99,8 @@ TEST(PackageEntries, AreComparedEvenIfNoInstallerIsAsked) {
   EXPECT_EQ(without["warnings"][0]["reason"], "entries-missing");
 }
 
-// The simulator has just extracted the library from the package, so nobody changed it after that.
+// With --install, the simulator itself extracts the library just before the run, so nobody changed
+// it after the extraction.
 TEST(PackageEntries, LibraryChangedInsideThePackageIsNotBlamedOnTheInstallation) {
   const json event = VerdictOf("changed-inside", {"--installer=off", "--install"});
   EXPECT_EQ(event["verdict"], "partly-signed");
@@ -108,8 +110,9 @@ TEST(PackageEntries, LibraryChangedInsideThePackageIsNotBlamedOnTheInstallation)
   EXPECT_EQ(event["entries"]["differing"]["looked_at"], 1);
 }
 
-// The verifier reports the wrong length as an error of the package, and does not give up. The
-// length of an entry is in its local header and in its central directory header.
+// The verifier reports a wrong length of an entry as an error of the package, and does not give up.
+// The length is in the entry's local header and in its central directory header, so both are
+// changed.
 TEST(Installer, RefusesAnEntryThatIsLongerThanItClaims) {
   const TempDir directory;
   const ProcessResult made = RunProcess({"bash", "-e", "-c", R"(cp -r "$0"/* .
@@ -132,7 +135,8 @@ open("base.apk", "wb").write(data)')",
       << run.output << run.errors;
 }
 
-// Phones of API 27 verify v2, and later phones verify v3.
+// Phones of API 27 verify v2, and later phones verify v3. The message has the reason of the oldest
+// phones.
 TEST(Installer, RefusesAPackageChangedAfterItsV2Signature) {
   for (const char* name : {"commented", "changed-inside-v2"}) {
     EXPECT_EQ(
@@ -173,13 +177,14 @@ TEST(Installer, OtherSignerIsShownInTheVerdict) {
   EXPECT_EQ(Told("two-signers"),
             Lines({"SIGNED, OTHER SIGNER", "phones of API 27 and later install it, verified by v2",
                    "-> 0"}));
-  // Phones before API 28 know only v2, which is made with the first key.
+  // Phones before API 28 do not know v3. They verify v2, which is made with the first key.
   EXPECT_EQ(Told("rotated-key", {"--api", "27"}),
             Lines({"SIGNED", "phones of API 27 install it, verified by v2", "-> 0"}));
 }
 
 // If the verifier is asked about all levels at once, it names one signer for all of them: the
-// signer with the first key.
+// signer with the first key. For a package with v3, the simulator therefore asks about ranges of
+// levels.
 TEST(Installer, SignerOnlyForLaterPhonesIsFound) {
   const Lines told = Told("later-v3");
   EXPECT_EQ(told.front(), "NOT INSTALLABLE");

@@ -118,8 +118,8 @@ Package WithAZeroBeforeTheModulus(std::string* digest) {
   return SignedAgain(MakePackage(), certificate, key);
 }
 
-// All that the simulator reports about a package: the exit status, the line of the verdict, the
-// text, the page and the journal's verdict.
+// The simulator's results for a package: the exit status, the line of the verdict, the text, the
+// page and the journal's verdict.
 struct Told {
   explicit Told(const Package& package, const std::vector<std::string>& options = {})
       : Told(package.Build(), options) {}
@@ -261,7 +261,7 @@ TEST(PackageReadInTwoWays, OtherPackageNameForInstallersIsReported) {
   EXPECT_EQ(told.Warnings(), Codes({"other-package-name"}));
 }
 
-// ---- The newer signatures (v2 and later): only the values that the platform reads count.
+// ---- The newer signatures (v2 and later) in the signing block.
 
 TEST(PackageReadInTwoWays, SecondValueOfASchemeIsIgnored) {
   const Bytes own = Signers({SignerBytes(SignatureBlock().SignerCertificate().Build())});

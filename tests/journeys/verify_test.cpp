@@ -25,7 +25,7 @@ ProcessResult Call(Words command, const Words& more, const std::string& director
   return RunProcess(command, directory);
 }
 
-// The answer of the simulated phone's kernel. `words` are options of the simulator and files.
+// The answer of the simulated phone's kernel. `words` are the files and the simulator's options.
 ProcessResult Verify(const Words& words) { return Call({SimulatorPath(), "--verify"}, words); }
 
 // The program's answer without a simulation.
@@ -74,7 +74,7 @@ TEST_F(SignedPackage, LibraryIsNotTrustedAfterAByteChanges) {
                apk_ + ": trusted\n" + library_ + ": not trusted (errno 126, ENOKEY)\n");
 }
 
-// Another phone signed the package.
+// Without --state, the phone does not know the files that the fixture's phone signed.
 TEST_F(SignedPackage, IsNotTrustedByAnotherPhone) {
   ExpectAnswer(Verify({apk_}), 1, apk_ + ": not trusted (errno 126, ENOKEY)\n");
 }
@@ -175,8 +175,8 @@ TEST(Verify, ControlCharactersInFileNamesAreEscaped) {
                "gr\xc3\xbcn \xc2\xa0 \\xc2\\x9b \\xc2\\x80 \xff: not trusted (errno 22, EINVAL)\n");
 }
 
-// The workstation's kernel does not have the feature. It does not know the feature's fcntl command,
-// and refuses it with EINVAL.
+// The workstation's kernel does not have the file-integrity feature. It refuses the feature's
+// unknown fcntl command with EINVAL.
 TEST(Verify, KernelWithoutTheFeatureTrustsNoFile) {
   const TempDir directory;
   const std::string file = directory.Write("file", {});

@@ -1,5 +1,5 @@
-// Tests which files the tool asks the kernel to sign, their payloads, and the log. Packages are
-// real files with their libraries beside them. A Phone takes the place of the kernel.
+// Tests which files the tool asks the kernel to sign, their payloads, and the log. Most packages
+// are real files with their libraries beside them. A Phone takes the place of the kernel.
 #include "sign/signing.h"
 
 #include <fcntl.h>
@@ -353,7 +353,8 @@ TEST(VeltSignJni, RefusalByTheKernelDoesNotChangeTheResult) {
                      Finished()}));
 }
 
-// The file vanishes between the check and the opening: only the open for the check succeeds.
+// The library vanishes after its check: the open for the check succeeds, and the open for the
+// signing fails.
 TEST(VeltSignJni, LibraryThatVanishesAfterItsCheckIsReportedWithItsErrno) {
   const ZipItem library = Library("lib/arm64-v8a/libfoo.so");
   PackageOnPhone file(MakePackage(WithLibraries({library})));

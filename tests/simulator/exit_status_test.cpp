@@ -83,8 +83,8 @@ TEST(ExitStatus, IsThreeWhenTheVerifierDoesNotEnd) {
   EXPECT_EQ(result.status, 3);
 }
 
-// Reading a pipe waits for a writer, and a device has no end. Even with --state, the simulator
-// reads neither of them.
+// Reading a pipe waits for a writer, and /dev/zero has no end. The simulator must not read these
+// files, even to digest them for --state.
 TEST(ExitStatus, IsOneForADeviceOrAPipe) {
   const TempDir directory;
   const std::string pipe = directory / "pipe";

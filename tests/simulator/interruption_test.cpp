@@ -59,7 +59,7 @@ TEST(Interruption, EndsTheToolAndTheSimulatorByTheSignal) {
         pid, {"env", "LC_ALL=C.UTF-8", SimulatorPath(), "--tool", PROBE_PATH, slow.path()}, signal);
     EXPECT_EQ(run.ended_by, signal);
     EXPECT_LT(run.seconds, 20) << "the tool sleeps for 60 seconds";
-    EXPECT_EQ(kill(std::stoi(ContentOf(pid)), 0), -1) << "the tool has ended, too";
+    EXPECT_EQ(kill(std::stoi(ContentOf(pid)), 0), -1) << "the tool must have ended";
     const std::string start =
         "NOT SIMULATED  " + slow.path() +
         "   it was interrupted\n  ✗ tool  it was interrupted\n      Run it again.\n";
@@ -92,7 +92,7 @@ TEST(Interruption, EndsTheInstallersVerifierWithoutAResult) {
                               SimulatorPath(), "--quiet", "--installer=required", file});
   EXPECT_EQ(run.ended_by, SIGTERM);
   EXPECT_EQ(run.output, "NOT SIMULATED  " + file + "   it was interrupted\n");
-  EXPECT_EQ(kill(std::stoi(ContentOf(pid)), 0), -1) << "the verifier has ended, too";
+  EXPECT_EQ(kill(std::stoi(ContentOf(pid)), 0), -1) << "the verifier must have ended";
 }
 
 // The reader takes one byte and ends. By then the simulator is writing the libraries of the large
@@ -123,8 +123,8 @@ TEST(Interruption, EndOfTheReaderLeavesNoTemporaryFiles) {
   EXPECT_TRUE(std::filesystem::is_empty(temporary.path()));
 }
 
-// The simulator continues after a signal that its caller ignores. For example, nohup starts
-// programs that ignore SIGHUP.
+// The simulator continues after a signal that its caller ignores. For example, nohup ignores SIGHUP
+// before it starts a program.
 TEST(Interruption, SignalThatTheCallerIgnoresDoesNotEndTheRun) {
   const Probe slow({"sign 3 0000", "pid", "sleep 1"});
   const ProcessResult result = RunProcess(

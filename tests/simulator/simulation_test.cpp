@@ -172,7 +172,7 @@ TEST(Journal, HasNoHiddenCharacters) {
   EXPECT_EQ(ParseJournal(result.output)[1]["file"], odd);
 }
 
-// An earlier green report must not outlive a run that could not begin.
+// The reports of an earlier good run must not remain after a run that could not begin.
 TEST(Reports, ShowAnErrorIfTheRunCannotBegin) {
   const Probe good({"sign 3 0000"});
   const std::string junit = good.directory() / "junit.xml", sarif = good.directory() / "log.sarif";

@@ -50,7 +50,8 @@ void PutString8(Bytes& out, const std::string& text) {
   out.push_back(0);
 }
 
-// A length in a UTF-16 pool: one unit, or two units, the first of which has its highest bit set.
+// A string in a UTF-16 pool. It starts with its length: one unit, or two units, the first of which
+// has its highest bit set.
 void PutString16(Bytes& out, const std::string& text) {
   const std::u16string units = ToUtf16(text);
   if (units.size() > 0x7fff) Put16(out, static_cast<uint16_t>(0x8000 | (units.size() >> 16)));

@@ -67,7 +67,7 @@ PackageOptions PlainJar();
 PackageOptions WithLibraries(const std::vector<ZipItem>& libraries);
 // Options for a good package with a native library and no dex file.
 PackageOptions WithoutDex();
-// Options for a good package with this text as its manifest.
+// Options for a package whose META-INF/MANIFEST.MF is this text.
 PackageOptions WithManifest(const std::string& text);
 
 // The big-endian modulus of the RSA test key: the manufacturer key of packages that it signs.

@@ -1,10 +1,11 @@
 // The parts that only a phone has, inside the test program: the kernel's integrity feature and
 // libzu.
 //
-// A program that links this file must have the linker wrap open, read, fcntl, fopen, usleep,
-// fgetxattr and readlink, and the checked forms of open, read and readlink (target `phone` does
-// that). Its tests then set up a Phone, and read the results from it. While no Phone exists, every
-// wrapped call goes to the real system, and libzu refuses.
+// In a program that links phone.cpp, the linker must wrap open, read, fcntl, fopen, usleep,
+// fgetxattr and readlink. It must also wrap the forms of open, read and readlink that
+// _FORTIFY_SOURCE uses. The target `phone` sets these options. The program's tests create a Phone,
+// and read the results from it. While no Phone exists, every wrapped call goes to the real system,
+// and libzu refuses.
 #pragma once
 
 #include <cstdint>

@@ -1,8 +1,8 @@
 // Builds the signature block of a signed JAR: a PKCS#7 SignedData (RFC 2315 §9) without content,
 // with one signer.
 //
-// The defaults make a good block. Each field changes one part of it. An optional field that is set
-// has DER, which replaces the part that Build would make.
+// The defaults make a good block. The fields change parts of it. An optional field that is set has
+// DER, which replaces the part that Build would make.
 #pragma once
 
 #include <optional>
@@ -33,7 +33,7 @@ struct SignatureBlock {
   std::optional<Bytes> content_type;      // the ContentInfo's OBJECT IDENTIFIER
   std::optional<Bytes> signed_data;       // the whole SignedData
 
-  // The signer's certificate in the block, unless `certificates` is set.
+  // The signer's certificate. Build puts it into the block unless `certificates` is set.
   Certificate SignerCertificate() const;
   // The SignerInfo of the signer, who signs the bytes of the signature file.
   Bytes SignerInfo(const Bytes& signature_file) const;

@@ -1,8 +1,8 @@
 // Writes ZIP archives, with true or with false fields.
 //
-// Every field that an item leaves unset gets its true value, or 0 in a local header if a data
-// descriptor follows. A field that is set in `local`, `central` or `descriptor` is written
-// unchanged, only in that place.
+// A length or CRC that an item leaves unset gets its true value. Exception: in the local header, it
+// is 0 if a data descriptor follows. A field that is set in `local`, `central` or `descriptor` is
+// written unchanged, only in that place.
 #pragma once
 
 #include <cstdint>

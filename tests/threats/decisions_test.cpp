@@ -1,6 +1,7 @@
 // Tests the two refusals that no package of a signing tool causes: the refusal of an exponent of 1,
-// and the refusal of a library that has changed since it was read. Each test starts from a package
-// that aapt and apksigner made, and then forges its signature block or replaces a library.
+// and the refusal of a library that has changed since it was read. The tests start from packages
+// that aapt and apksigner made. Most tests then forge the signature block, or change or replace a
+// library.
 #include <sys/stat.h>
 
 #include <algorithm>
@@ -53,7 +54,7 @@ TEST(Threat, OtherExponentsReachTheCheckOfTheCertificate) {
   }
 }
 
-// ---- The file that is signed is the file that was read.
+// ---- A library is signed only if it still has the bytes that were read.
 
 class LibraryAfterItsCheck : public testing::Test {
  protected:

@@ -1,5 +1,5 @@
-// Tests documents and manifests in a block at the end of the readable memory. If the platform's
-// parser or the tool's parser reads beyond the block, the test crashes.
+// Tests documents, manifests and their tables in a block at the end of the readable memory. If the
+// platform's parser or the tool's code reads beyond the block, the test crashes.
 #include <gtest/gtest.h>
 
 #include "apk/apk.h"
@@ -76,7 +76,7 @@ TEST(CompiledManifestAtMemoryEnd, IsRefusedIfShorterThanAHeader) {
     ApkTools::Apk apk(-1);
     LogCapture log;
     EXPECT_FALSE(ParseAtMemoryEnd(&apk, Bytes(whole.begin(), whole.begin() + size)));
-    // The parser's code for a type that it does not accept.
+    // 0x80000001 is the parser's code for a type that it does not accept.
     EXPECT_EQ(log.records(), Records({Error("ParseAndroidManifest failed to init xml parser, "
                                             "error=0x80000001\n")}))
         << size;
@@ -121,9 +121,9 @@ TEST(ManifestSectionsAtMemoryEnd, AreNotReadBeyondTheLastAttribute) {
   EXPECT_EQ(sections[0].find("83"), std::string(30, 'v'));
 }
 
-// Names and values have 1 to 19 bytes, because the parser reads eight bytes at once. The text is
-// cut at each multiple of 4 bytes, because only a block of such a size ends exactly where memory
-// ends.
+// Names and lines of values have 1 to 19 bytes, because the parser reads eight bytes at once. The
+// text is cut at each multiple of 4 bytes, because only a block of such a size ends exactly where
+// memory ends.
 TEST(JarManifestAtMemoryEnd, IsNotReadBeyondTheBlockAtAnyLength) {
   for (size_t length = 1; length < 20; ++length) {
     const std::string run(length, 'v');

@@ -75,8 +75,8 @@ TEST(Threat, FirstCertificateAndFirstSignatureOfTwoSignersCount) {
 
 // The certificate's modulus is the signer's modulus with four more bytes. The tool writes the fifth
 // to eighth bytes of the exponent over the modulus length (crypto/pkcs7.h). Here these bytes are 00
-// 01 00 00, which is 256 in host byte order, so the tool ignores the four bytes. Other readers see
-// a key of 2080 bits.
+// 01 00 00, which is 256 in host byte order, so the tool ignores the last four bytes of the
+// modulus. Other readers see a key of 2080 bits.
 TEST(Threat, ModulusWithExtraBytesIsTheKeyThatItStartsWith) {
   Package package = MakePackage();
   Certificate certificate;
@@ -98,7 +98,7 @@ TEST(Threat, OlderPackageOfASignerKeepsItsPayload) {
   EXPECT_EQ(Device(older).FilesSignedFor("rsa-2048"), Strings({"app/base.apk"}));
 }
 
-// ---- Names.
+// ---- Names, and the Android manifest.
 
 PackageOptions WithLibrariesNamed(const Strings& names) {
   PackageOptions options;
@@ -184,7 +184,7 @@ TEST(Threat, PackageAndKeyAreAcceptedEvenIfEveryLibraryIsRefused) {
             Strings({"com.example.app " + Hex(ModulusOf("rsa-2048"))}));
 }
 
-// Nothing was extracted, and the bytes in the package are not read.
+// No library was extracted, and the tool does not read the library's bytes in the package.
 TEST(Threat, LibrariesThatStayInThePackageAreNotCompared) {
   Package package = MakePackage();
   package.Item("lib/arm64-v8a/libfoo.so").data = ToBytes("another's");
@@ -231,7 +231,7 @@ TEST(Threat, DamagedLibraryEndsTheIterationAndLaterOnesStayUnsigned) {
   }
 }
 
-// ---- Files that are written to during the run.
+// ---- Files that are changed during the run.
 
 // Runs the tool's steps. Returns the path of each signed file, and its bytes when it was signed.
 std::map<std::string, std::string> BytesSigned(Device& device) {

@@ -31,11 +31,11 @@ using nlohmann::json;
 constexpr char kAcceptedShortPadding[] = "AcceptedShortPadding";
 constexpr char kWrongHash[] = "WrongHash";
 
-// The digests that the tool knows. It refuses a signature over any other digest, even a good one.
+// The digests that the tool knows. It refuses even a good signature over any other digest.
 constexpr const char* kDigests[] = {"MD5", "SHA-1", "SHA-256"};
 
 struct Counts {
-  int valid = 0, wrong_hash = 0, lenient = 0, acceptable = 0;  // those that verify
+  int valid = 0, wrong_hash = 0, lenient = 0, acceptable = 0;  // vectors that verify
   int refused = 0;
   // Signatures of another length than the modulus. They are not verified, because rsa_pkcs1_verify
   // always reads as many bytes as the modulus has.

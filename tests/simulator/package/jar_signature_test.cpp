@@ -160,8 +160,7 @@ TEST(SignatureFile, ClaimsSchemesOnlyInItsFirstSection) {
   EXPECT_EQ(claimed("no signature file"), "");
 }
 
-// The first section with a digest of the manifest counts. If this section has several such digests,
-// the one that the tool chooses counts.
+// Only the first section with a digest of the manifest counts.
 TEST(SignatureFile, MayHaveTheManifestsSha1Digest) {
   const auto has_sha1 = [](const std::string& text) {
     PackageOptions options;

@@ -1,8 +1,9 @@
 // probe FILE: takes the place of the tool in tests. Executes the lines of FILE, each of which is a
-// command and its arguments. For each command, writes the line "RESULT ERRNO" to FILE.out. errno is
-// set to 77 before the command, so that the line shows whether the command changed it. In place of
-// a payload's digits, "null" and "wild" name memory that cannot be read, and "cut" names a payload
-// that continues into an unmapped page.
+// command and its arguments. The first line of FILE.out is "fd N", with the descriptor of FILE.
+// After each command, the probe writes the line "RESULT ERRNO" to FILE.out. errno is set to 77
+// before the command, so that the line shows whether the command changed it. In place of a
+// payload's hexadecimal digits, "null" and "wild" name memory that cannot be read, and "cut" names
+// a payload that continues into an unmapped page.
 #include <fcntl.h>
 #include <sys/mman.h>
 #include <sys/resource.h>
@@ -114,7 +115,8 @@ long WriteId(const Words&) {
   return 0;
 }
 
-// The number of descriptors from 3 to 19999 that exec would leave open.
+// The number of descriptors from 3 to 19999 that exec would leave open. The descriptors of the
+// stand-ins, such as the journal, are in this range.
 long Inherited(const Words&) {
   long count = 0;
   for (int fd = 3; fd < 20000; ++fd) {

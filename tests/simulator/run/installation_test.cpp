@@ -23,7 +23,8 @@ namespace fs = std::filesystem;
 
 const Deadline kLater(1e6);
 
-// "path content" of each file that the installation extracts beside the package.
+// Lays out the package: puts it into a temporary directory, and extracts its libraries beside it.
+// Returns "path content" of each extracted file.
 std::vector<std::string> LaidOutOf(const PackageOptions& package, InstalledAbi abi,
                                    std::vector<std::string>* left_out = nullptr) {
   const TempDir directory;
@@ -71,8 +72,9 @@ TEST(Installation, HasTheLibrariesOfTheChosenProcessors) {
   EXPECT_EQ(LaidOut(kBoth, InstalledAbi::kArm64), Files({"lib/arm64/liba.so 64"}));
   EXPECT_EQ(LaidOut(kBoth, InstalledAbi::kArm), Files({"lib/arm/liba.so 32"}));
   EXPECT_EQ(LaidOut({kBoth[2]}, InstalledAbi::kAll), Files({"lib/arm/liba.so old"}));
-  // If a package has two ABIs for one processor, only the libraries of the preferred ABI are
-  // extracted, even if those of the other ABI have other names.
+  // If a package has two ABIs for one processor, only the libraries of the preferred ABI, here
+  // armeabi-v7a, are extracted. A library of armeabi is not extracted even if armeabi-v7a has no
+  // library of this name.
   EXPECT_EQ(LaidOut({kBoth[1], {"lib/armeabi/libb.so", ToBytes("old")}}, InstalledAbi::kAll),
             Files({"lib/arm/liba.so 32"}));
 }
@@ -172,7 +174,8 @@ TEST(Installation, NamesTheLibrariesThatCannotBeExtracted) {
   EXPECT_FALSE(fs::exists(place / "lib/arm64/libdata.so"));
 }
 
-// The copy is named base.apk, so it cannot collide with the directory lib beside it.
+// In the temporary directory, the package has the name base.apk, so it cannot collide with the
+// directory lib beside it.
 TEST(Installation, PackageNamedLibBecomesBaseApk) {
   const TempDir directory;
   const std::string file = directory / "lib";
@@ -208,8 +211,9 @@ TEST(Installation, SaysWhenItCannotWrite) {
   EXPECT_EQ(problem_with(3000), "");
 }
 
-// A lease (F_SETLEASE) delays every other open() of the file. The installation does not wait for
-// the end of the lease. The tool waits, and the report then names the lease.
+// A write lease (F_SETLEASE) delays every other open() of the file, unless open() has the flag
+// O_NONBLOCK. The installation uses this flag, and leaves the package where it is. The tool waits,
+// and the simulator's report then names the lease.
 TEST(Installation, DoesNotWaitForALease) {
   const TempDir directory;
   const std::string file = directory / "base.apk";
@@ -305,12 +309,11 @@ TEST(Installation, FailsAfterAnInterruption) {
   EXPECT_EXIT(lay_out(), testing::ExitedWithCode(0), "");
 }
 
-// ---- A package without libraries beside it.
-
+// With kAlone, a package is laid out only if no libraries or library directories are beside it.
 TEST(Installation, IsMadeForAPackageWithoutLibrariesBesideIt) {
   const TempDir directory;
   const std::string file = directory / "base.apk";
-  // The tool looks for a library of this ABI in lib/armX.
+  // The tool looks for the libraries of lib/armeabiX in lib/armX.
   MakePackage(WithLibraries({kBoth[0], {"lib/armeabiX/libx.so", ToBytes("x")}})).WriteTo(file);
   const auto is_laid_out = [&file](InstallWhen when) {
     Installation installation;
@@ -326,7 +329,7 @@ TEST(Installation, IsMadeForAPackageWithoutLibrariesBesideIt) {
     EXPECT_TRUE(is_laid_out(InstallWhen::kAlways)) << place;
     fs::remove_all(directory / "lib");
   }
-  // A link can be in another directory, but the tool looks beside the package itself.
+  // A link can be in a directory other than the package's, but the tool looks beside the package.
   const TempDir links;
   fs::create_symlink(file, links / "base.apk");
   fs::create_directories(directory / "lib/arm64");

@@ -151,7 +151,7 @@ TEST(Warnings, KeyThatMatchesOnlyInPartIsReported) {
   EXPECT_EQ(Warnings(facts).size(), 1U);
   facts.newer = {{"v2", CertificateWith("CN=other", kOther, "jar key")}};
   EXPECT_EQ(Warnings(facts).size(), 1U);
-  // Without a readable certificate, only the kernel's key can be compared.
+  // Without a readable certificate, only the key that the kernel got can be compared.
   facts.jar.certificate.reset();
   facts.newer = {{"v2", CertificateWith("CN=other", kOther, "jar key")}};
   EXPECT_EQ(Warnings(facts).size(), 2U);
@@ -263,7 +263,7 @@ TEST(Warnings, FaultThatAnItemReportsIsNotRepeated) {
   EXPECT_EQ(Warnings(facts, report), Lines({"entries-damaged: 1 entry: damaged"}));
 }
 
-// ---- Keys that nobody should sign a release with.
+// ---- Keys, digests and certificates that nobody should sign a release with.
 
 TEST(Warnings, KeyOfFewerThan2048BitsIsReported) {
   PackageFacts facts = Good();
@@ -335,8 +335,8 @@ TEST(Warnings, CertificateOfANewerSchemeIsCheckedAsWell) {
   EXPECT_EQ(Warnings(facts), Lines());
 }
 
-// `date -u -d @1000000000` prints 2001-09-09 01:46:40. The certificate is still valid in the second
-// that notAfter names.
+// The time 1000000000 is 2001-09-09 01:46:40 UTC (`date -u -d @1000000000`). The certificate is
+// still valid in the second that notAfter names.
 TEST(Warnings, ExpiredCertificateIsReported) {
   const auto told = [](std::optional<int64_t> end, int64_t now) {
     PackageFacts facts = Good();
@@ -351,6 +351,8 @@ TEST(Warnings, ExpiredCertificateIsReported) {
   EXPECT_EQ(told(1000000000, 1000000000), Lines());
   EXPECT_EQ(told({}, 1000000001), Lines());
 }
+
+// ---- Encrypted entries.
 
 TEST(Warnings, EncryptedEntriesAreNotCalledDamaged) {
   PackageFacts facts = Good();
