@@ -1,6 +1,6 @@
 // Extracts an entry into memory. The signature does not cover the lengths that an archive declares,
 // so each length is checked before memory is allocated for it. Results are the zip library's codes
-// (0: success). Nothing is logged.
+// (0: success). This code logs nothing, but the zip library can log a failure.
 #pragma once
 
 #include <ziparchive/zip_archive.h>
@@ -15,13 +15,14 @@ namespace ApkTools {
 inline constexpr int32_t kZipInconsistentInformation = -9;
 inline constexpr int32_t kZipAllocationFailed = -13;
 
-// Memory for an entry of at most this declared length, in bytes, is allocated before the data is
-// read. The data of a longer entry is first read once, to check its length.
+// A limit for the declared length of an entry, in bytes. Up to this limit, memory is allocated
+// before the data is read. The data of a longer entry is first read once, to check its length.
 inline constexpr uint32_t kZipTrustedLength = 64 << 20;
 
-// True if the declared length is possible. A stored entry is as long as its data. A deflated entry
-// is at most 1032 times as long as its data: two bits encode at most 258 bytes (RFC 1951 section
-// 3.2.5), so one byte of data encodes at most 4 * 258 bytes.
+// True if the declared length is possible for the entry's compressed length. For a stored entry,
+// the two must be equal. A deflated entry is at most 1032 times as long as its compressed data: two
+// bits encode at most 258 bytes (RFC 1951 section 3.2.5), so one byte encodes at most 4 * 258
+// bytes.
 bool IsPlausibleLength(const ZipEntry& entry);
 
 // Extracts the whole entry into `out`, which then has the entry's length. If the declared length is

@@ -4,9 +4,9 @@
 // `fortify` checks this on a workstation. The workstation's C library has functions such as
 // __read_chk, but its headers rarely call them. This header therefore calls them.
 //
-// The preset includes this header at the start of every source (-include). Each function below is
-// an overload of a C library's function, because it has a pass_object_size parameter. The compiler
-// prefers this overload because of enable_if.
+// The preset includes this header at the start of every source (-include). The attribute
+// pass_object_size makes each function below an overload of the C library's function, even if both
+// have the same parameter types. The compiler prefers this overload because of enable_if.
 #pragma once
 
 #include <fcntl.h>
