@@ -23,8 +23,9 @@ bool IsShown(std::string_view character, const Look& look) {
 
 Look LookOfStandardOutput() {
   setlocale(LC_CTYPE, "");
+  const char* const no_color = getenv("NO_COLOR");
   Look look;
-  look.has_colours = isatty(STDOUT_FILENO) != 0 && getenv("NO_COLOR") == nullptr;
+  look.has_colours = isatty(STDOUT_FILENO) != 0 && (no_color == nullptr || no_color[0] == '\0');
   look.has_utf8 = strcmp(nl_langinfo(CODESET), "UTF-8") == 0;
   return look;
 }

@@ -12,8 +12,8 @@ struct Look {
   bool has_utf8 = true;  // else only ASCII is shown
 };
 
-// The abilities of standard output: colours on a terminal, unless NO_COLOR is set; UTF-8 if the
-// locale's characters are UTF-8.
+// The abilities of standard output: colours on a terminal, unless NO_COLOR is set and not empty;
+// UTF-8 if the locale's characters are UTF-8.
 Look LookOfStandardOutput();
 
 // Returns `bytes` without anything that controls a terminal or misleads its reader. Hidden

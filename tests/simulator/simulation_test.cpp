@@ -1,4 +1,5 @@
-// apktoolkit-sim and its files, its journal and its page.
+// Tests apktoolkit-sim: its text for several files, its journal, its page, its reports, and its
+// runs of the tool.
 #include <gtest/gtest.h>
 #include <unistd.h>
 
@@ -82,7 +83,7 @@ TEST(SimulatorOutput, ShowProgressOnATerminalWhenItTakesLonger) {
   EXPECT_NE(verdict, std::string::npos) << result.output;
 }
 
-// https://no-color.org
+// https://no-color.org: the variable counts if it is present and not empty.
 TEST(SimulatorOutput, VariableNoColorTurnsColoursOff) {
   if (RunProcess({"script", "-qec", "true", "/dev/null"}).status != 0) {
     GTEST_SKIP() << "there are no pseudo-terminals here: /dev/pts is not mounted";
@@ -94,7 +95,9 @@ TEST(SimulatorOutput, VariableNoColorTurnsColoursOff) {
     return RunProcess({"script", "-qec", command, "/dev/null"}).output;
   };
   EXPECT_EQ(shown("NO_COLOR=1"), "TRUSTED JAR  " + good.path() + "\r\n");
-  EXPECT_EQ(shown("-u NO_COLOR"), "\x1b[32mTRUSTED JAR\x1b[0m  " + good.path() + "\r\n");
+  const std::string green = "\x1b[32mTRUSTED JAR\x1b[0m  " + good.path() + "\r\n";
+  EXPECT_EQ(shown("-u NO_COLOR"), green);
+  EXPECT_EQ(shown("NO_COLOR="), green);
 }
 
 // The name of a file may contain control sequences for the terminal.
@@ -336,7 +339,8 @@ TEST(TrustState, IsSharedByTheFilesOfARunWithoutADirectory) {
   EXPECT_EQ(verified[1]["result"], 0);
 }
 
-// The last runs begin after the first ones have ended, but do not know what those signed.
+// The last runs begin after the first ones have ended, but do not know which files the first runs
+// signed.
 TEST(TrustState, IsNotSharedWhenSeveralFilesRunAtATime) {
   const Probe jar({"verify 3", "sign 3 0000"});
   const ProcessResult result = Simulated(
