@@ -97,7 +97,6 @@ TEST(SecondInit, HasOnlyTheFactsOfTheSecondPackage) {
     files.push_back(std::make_unique<MemoryFile>(MakePackage(options).Build(), name));
   }
   for (const auto& second : files) {
-    LogCapture log;
     auto fresh = std::make_unique<Apk>(-1);
     const Facts expected = AfterInit(*fresh, *second);
     EXPECT_TRUE(expected.is_good_apk);
