@@ -54,7 +54,7 @@ bool Apk::ParseAndroidManifest(std::vector<uint8_t> bytes) {
        event = parser.next()) {
     // Deliberate: a malformed node ends the document. The facts found before that node count.
     if (event == ResXMLParser::BAD_DOCUMENT) break;
-    // Elements count at any depth.
+    // The depth of an element does not matter.
     if (event != ResXMLParser::START_TAG) continue;
     size_t length = 0;
     const char16_t* const element_name = parser.getElementName(&length);

@@ -47,7 +47,7 @@ class Apk {
   // extracted.
   //
   // The flags below show the outcome. A second call first clears the flags. Facts that the second
-  // call does not reach keep their former values.
+  // call does not set keep their former values.
   void Init(int fd, const char* path);
 
   // Closes the archive, and the descriptor if Init opened it. The facts stay. The caller must not
@@ -64,10 +64,10 @@ class Apk {
   bool IsApk() const { return is_apk_; }
   // The package attribute of the Android manifest, UTF-8; may be empty.
   const std::string& GetPackageName() const { return package_name_; }
-  // If the signature verified, the signer's RSA modulus: big-endian, without one leading zero byte.
-  // Otherwise empty.
+  // The signer's RSA modulus if Init verified the signature block, otherwise empty. Big-endian; one
+  // leading zero byte is left out.
   const std::vector<uint8_t>& GetManufacturerKey() const { return manufacturer_key_; }
-  // The Android manifest asks for the secure-storage permission.
+  // The Android manifest asks for the secure-storage permission, or declares this permission.
   bool IsSsPermissionRequired() const { return ss_permission_required_; }
 
   // Iterate over the entries of the archive, which must be open. Results are the zip library's
@@ -108,8 +108,8 @@ class Apk {
   // true.
   bool ParseAndroidManifest(std::vector<uint8_t> bytes);
 
-  // True if the package verified, and its "classes.dex" has the digest that the manifest records. A
-  // package without "classes.dex" needs no such check. The first call checks that entry; later
+  // True if Init verified the package, and "classes.dex" has the digest that the manifest records.
+  // A package without "classes.dex" needs no such check. The first call checks that entry; later
   // calls return the same result.
   bool IsGoodApk();
   // True if `entry`, which the zip library found under `name`, has the digest that the manifest
@@ -149,7 +149,8 @@ class Apk {
   bool ss_permission_required_ = false;
   std::string package_name_;
   // The content of the entry or file that was digested last. Its memory is reused for the next
-  // entry or file. For large libraries, freeing and allocating it again would cost 2 % of the time.
+  // entry or file. For large libraries, freeing and allocating it again would cost 2 % of the
+  // tool's time.
   std::vector<uint8_t> content_;
 };
 

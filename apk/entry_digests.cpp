@@ -13,9 +13,9 @@ ManifestMf::Section::value_type DigestOf(const ManifestMf::Section& section) {
   return section.findLastEndingIn("-Digest");
 }
 
-// std::hash is not used. In older releases of the C++ library, the unsigned arithmetic of std::hash
-// wraps and is not marked as intended. A tool that is built with the sanitizer for unsigned
-// overflow would stop there.
+// std::hash is not used. Its unsigned arithmetic wraps, and older releases of the C++ library do
+// not mark this as intended. A tool that is built with the sanitizer for unsigned overflow would
+// therefore stop in std::hash.
 size_t Hash(std::string_view name) {
   size_t hash = 0;
   for (const char c : name) hash = (hash << 9 | hash >> 55) ^ static_cast<uint8_t>(c);
@@ -37,14 +37,14 @@ void EntryDigests::List() {
   bool in_order = true;
   for (uint32_t i = 0; i < sections.size(); ++i) {
     const std::string_view name = NameOf(i);
-    // This also leaves out the main section, which normally has no name.
+    // The main section is also left out, because it normally has no name.
     if (name.empty() || DigestOf(sections[i]).first.empty()) continue;
     in_order = in_order && last <= name;
     last = name;
     sections_.push_back(i);
   }
-  // apksigner writes the names in order. Other tools, such as jarsigner, write them in the order of
-  // the archive.
+  // apksigner writes the sections in the order of their names. Other tools, such as jarsigner,
+  // write the sections in the order of the archive's entries.
   if (!in_order) Sort();
 }
 
@@ -56,7 +56,8 @@ bool EntryDigests::Find(std::string_view name, std::string& digest_name,
     last = first + (equal.second - hashes_.begin());
     first += equal.first - hashes_.begin();
   }
-  // Finds the last of equal names, because a later section replaces an earlier one.
+  // Finds the last section of this name, because a later section replaces an earlier section of the
+  // same name.
   const auto next = std::upper_bound(
       first, last, name,
       [this](std::string_view wanted, uint32_t section) { return wanted < NameOf(section); });
@@ -67,9 +68,9 @@ bool EntryDigests::Find(std::string_view name, std::string& digest_name,
   return true;
 }
 
-// Sorts by the hashes of the names. Sections with equal hashes are sorted by their names, and then
-// by their place in the text. Hashing reads each name once, which costs less than comparing names
-// that are spread over the text.
+// Fills hashes_, and sorts sections_ by the hashes of the names. Sections with equal hashes are
+// sorted by their names, and then by their place in the text. Hashing reads each name once, which
+// costs less than comparing names that are spread over the text.
 void EntryDigests::Sort() {
   std::vector<std::pair<size_t, uint32_t>> hashed;
   hashed.reserve(sections_.size());

@@ -115,11 +115,11 @@ class Parser {
   }
 
   // Deliberate: if a line break follows the colon directly, the cursor always moves to the second
-  // byte after the colon. If the line break is CR LF or LF CR, that byte is its second byte. If it
-  // is a lone CR or LF, that byte is the first byte of the next line, and then counts as the line
-  // break. A name on the next line loses its first byte. An empty line, or a continuation line with
-  // one space, is not recognised. Signing tools write CR LF. For other files, the result must not
-  // change.
+  // byte after the colon. After CR LF or LF CR, that byte is the second byte of the line break.
+  // After a lone CR or LF, that byte is the first byte of the next line. The parser then treats
+  // this first byte as the line break. A name on the next line loses its first byte. An empty line,
+  // or a continuation line with one space, is not recognised. Signing tools write CR LF. For other
+  // files, the result must not change.
   bool passColon() {
     const char next = byteAt(cursor_ + 1);
     if (next != ' ' && !IsLineBreak(next)) {

@@ -33,8 +33,8 @@ class ManifestMf {
   explicit operator bool() const { return valid_; }
 
   // The sections that the last load() found, in the order of the text, the main section first. A
-  // section that no empty line ended is left out. The returned reference must not be used after the
-  // object was loaded again or moved.
+  // section without an empty line at its end is left out. The returned reference must not be used
+  // after the object was loaded again or moved.
   const Sections& getSections() const { return sections_; }
 
  private:

@@ -1,6 +1,6 @@
 // The paths on disk of a package's native libraries. A table maps the ABI directories in the
 // archive to the directories beside the package into which the installer extracts the libraries.
-// The functions keep no state and log nothing.
+// InstalledLibraryPath keeps no state and logs nothing.
 #pragma once
 
 #include <string>

@@ -110,8 +110,8 @@ bool Apk::ValidateManifest(const std::vector<uint8_t>& manifest) {
     const std::string digest_name(name.substr(0, name.size() - kManifest.size()));
     const std::vector<uint8_t> expected = Base64Decode(std::string(value));
     if (!expected.empty() && VerifyData(digest_name, expected, manifest)) return true;
-    // Deliberate: the first section with a digest decides. If its digest is wrong, a later section
-    // does not count.
+    // Deliberate: the first section with a digest of the manifest decides. If its digest is wrong,
+    // a later section does not count.
     break;
   }
   LogError("Can't validate manifest.\n");

@@ -19,7 +19,7 @@ namespace {
 
 struct Plan {
   const char* name;
-  size_t entries;  // all entries but the signature's own
+  size_t entries;  // all entries except the signature's own
   size_t libraries;
   size_t library_size;
   size_t dex_size;

@@ -1,7 +1,8 @@
 """bench/report.py BUILD-DIRECTORY: measures the tool and two programs for comparison. The floor
 (bench_floor) does the tool's job without the verification. The peer (bench_peer) does the
-tool's job with OpenSSL. Prints tables of the results, and writes them and the plots to
-docs/performance.md. scripts/bench calls this script."""
+tool's job with OpenSSL. Prints tables of the results, and writes them to docs/performance.md. Writes
+the plots to docs/performance-entries.svg and docs/performance-time.svg. scripts/bench calls this
+script."""
 
 import collections
 import datetime
@@ -86,8 +87,9 @@ def measure(package):
 
 
 def expect_same_log(package):
-    """Exits unless the three programs wrote the same log, and this log has VeltSign's result 65536.
-    This result means failure: the kernel of a workstation has no integrity feature."""
+    """Exits if the three programs did not write the same log, or if this log has no signing step
+    with the result 65536. This result means that the step failed. It is expected here, because the
+    kernel of a workstation has no integrity feature."""
     logs = {re.sub(r'\d\d-\d\d \d\d:\d\d:\d\d +\d+ +\d+', '', subprocess.run(
         [program, package_path(package.name)], check=True, capture_output=True, text=True).stderr)
         for program in (TOOL, FLOOR, PEER)}
@@ -253,8 +255,8 @@ def text_table():
         yield '| ' + ' | '.join(cells) + ' |'
 
 
-# The parts of a run, each with a pattern. A sample of perf counts for the first part whose pattern
-# matches the file of the sampled code.
+# The parts of a run, each with a pattern. perf takes samples of the running code. Each sample counts
+# for the first part whose pattern matches the file of the sampled code.
 PARTS = (('start-up', r'/ld-linux'), ('kernel', r'kernel'), ('inflate', r'/libz\.'),
          ('digests', r'/libcrypto\.'), ("the tool's own code", r'/apktoolkit$'), ('libraries', r''))
 

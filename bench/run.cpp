@@ -32,7 +32,7 @@ void Fail(const char* what) {
   exit(1);
 }
 
-// Runs the program. Its output goes to /dev/null.
+// Runs the program once, with its output in /dev/null. Prints the line for this run.
 void Run(char* program, char* file, const posix_spawn_file_actions_t* silent) {
   char* arguments[] = {program, file, nullptr};
   const long long start = Now();

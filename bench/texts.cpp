@@ -3,8 +3,9 @@
 //
 //   READER <TAB> NAME <TAB> peak bytes for each byte of the text <TAB> nanoseconds for each byte
 //
-// The peak includes the text itself, which counts as one byte for each byte. Each text is read in a
-// separate process, so that memory that an earlier text left behind does not count.
+// The peak includes the text itself, so it is at least one byte for each byte of the text. Each
+// text is read in a separate process, so that memory that an earlier text left behind does not
+// count.
 #include <sys/wait.h>
 #include <unistd.h>
 

@@ -17,8 +17,9 @@ set(APKTOOLKIT_TOOL_OPTIONS -fno-exceptions -fno-rtti -Wconversion)
 # The hardening that the platform uses for its own programs. Symbols are bound before the program
 # starts, and their table is then read-only. Programs can be loaded at any address. The stack is
 # protected. Calls of C library functions are checked where the compiler knows the size of the
-# buffer. On 64-bit Arm, jumps and returns are protected, too. scripts/check-binary checks this in
-# the compiled files. It checks jumps and returns only in object files and static libraries.
+# buffer. On 64-bit Arm, jumps and returns are protected, too. scripts/check-binary checks that
+# compiled files have this hardening. It checks the protection of jumps and returns only in object
+# files and static libraries.
 option(APKTOOLKIT_HARDEN "Harden programs and libraries as the platform does" ON)
 if(APKTOOLKIT_HARDEN)
   include(CheckPIESupported)
@@ -41,8 +42,8 @@ if(APKTOOLKIT_SANITIZE)
   add_link_options(-fsanitize=${APKTOOLKIT_SANITIZE})
 endif()
 
-# Unsigned arithmetic may wrap in the tool only in the functions that are marked for it
-# (crypto/wrapping.h).
+# In the tool's code, unsigned arithmetic may wrap only in functions that are marked
+# WRAPS_ON_PURPOSE (crypto/wrapping.h).
 option(APKTOOLKIT_CHECK_OVERFLOW "Treat unsigned overflow as an error (clang)" OFF)
 if(APKTOOLKIT_CHECK_OVERFLOW)
   list(APPEND APKTOOLKIT_TOOL_OPTIONS -fsanitize=unsigned-integer-overflow

@@ -63,8 +63,8 @@ int asn1_parse_oid(const uint8_t* buf, size_t len, asn1_oid* oid);
 
 // Reads a whole OBJECT IDENTIFIER element from the `len` bytes at `buf`. Sets `next` to the
 // position after the element, even if the read then fails because the contents are malformed. Also
-// fails for any other element, for a truncated element and for empty contents. In these three
-// cases, `oid` and `next` stay unchanged.
+// fails for an element that is not an OBJECT IDENTIFIER, for a truncated element and for empty
+// contents. In these three cases, `oid` and `next` stay unchanged.
 int asn1_get_oid(const uint8_t* buf, size_t len, asn1_oid* oid, const uint8_t** next);
 
 // Writes the arcs as dotted text into the `size` bytes at `buf`. The text is cut to fit and ends

@@ -223,9 +223,9 @@ WRAPS_ON_PURPOSE void mpi_montmul(mpi* A, const mpi* B, const mpi* N, unsigned i
   }
   for (int i = 0; i <= n; ++i) A->p[i] = d[i];
 
-  // Deliberate: n limbs are always subtracted, so that both cases take about the same time. If A,
-  // the product, is below N, A is subtracted from T, and the difference is not used. T has A in its
-  // limbs from index n, so T is not less than A, and these limbs absorb the borrow.
+  // Deliberate: n limbs are subtracted even if the product, now in A, is below N. The time is then
+  // about the same for all products. If the product is below N, A is subtracted from T, and the
+  // difference is not used. T has a copy of A from index n on, and this copy absorbs the borrow.
   if (mpi_compare_abs(A, N) >= 0) {
     subtract_with_borrow(n, N->p, A->p);
   } else {
@@ -238,9 +238,9 @@ namespace {
 // Wipes and frees the limbs of X. X still points at them afterwards.
 void release_limbs(mpi* X) {
   clear_limbs(X);
-  // A compiler could drop the zeros of clear_limbs, because the memory is about to be freed. It
-  // must assume that the empty assembly reads these zeros, and therefore stores them. No test can
-  // check this, because gcc 12 and clang 14 store the zeros even without the assembly.
+  // A compiler could drop the zeros of clear_limbs, because the memory is about to be freed. With
+  // the empty assembly, the compiler must store the zeros, because the assembly might read them. No
+  // test can check this, because gcc 12 and clang 14 store the zeros even without the assembly.
   __asm__ __volatile__("" : : "r"(X->p) : "memory");
   free(X->p);
 }

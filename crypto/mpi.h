@@ -1,8 +1,8 @@
 // Multi-precision integers for the RSA public operation.
 //
 // A number owns its limbs. The limbs are allocated by malloc, and overwritten with zeros before
-// they are freed or replaced. Unless an operation's comment allows it, arguments must not be null,
-// and the same number must not be passed as two of them. Operations that allocate return
+// they are freed or replaced. No argument may be null, and no two arguments may be the same number,
+// except where the comment of an operation allows this. Operations that allocate return
 // kMpiNoMemory if malloc fails. The number that receives the result is then in a valid state. The
 // functions log nothing.
 #pragma once
@@ -89,7 +89,7 @@ int mpi_sub_abs(mpi* X, const mpi* A, const mpi* B);
 // X = A * b, with the sign of A. X may be A.
 int mpi_mul_int(mpi* X, const mpi* A, unsigned int b);
 
-// Adds s * b to d, over `count` limbs of s. d must have `count` limbs and, above them, every limb
+// Adds s * b to d, over `count` limbs of s. d must have `count` limbs, and also every higher limb
 // that the carry reaches. `s` may be null if `count` is 0.
 void mpi_mul_hlp(int count, const unsigned int* s, unsigned int* d, unsigned int b);
 
@@ -102,7 +102,7 @@ int mpi_mod_mpi(mpi* R, const mpi* A, const mpi* B);
 // not matter. A must have at least N.n + 1 limbs, B at least one, and T at least 2 * (N.n + 1).
 void mpi_montmul(mpi* A, const mpi* B, const mpi* N, unsigned int mm, mpi* T);
 
-// X = A^abs(E) mod N, for A >= 0 and N of fewer than 2^25 limbs. The calculation uses the number
-// 2^(64 * N.n), which must be shorter than 2^31 bits. X may be A, but neither E nor N. Returns
-// kMpiBadModulus, with X unchanged, if N is negative or even.
+// X = A^abs(E) mod N, for A >= 0 and N of fewer than 2^25 limbs. N has this limit because the
+// calculation uses the number 2^(64 * N.n), and every number must be shorter than 2^31 bits. X may
+// be A, but neither E nor N. Returns kMpiBadModulus, with X unchanged, if N is negative or even.
 int mpi_pow_mod(mpi* X, const mpi* A, const mpi* E, const mpi* N);

@@ -68,9 +68,9 @@ WRAPS_ON_PURPOSE uint32_t montgomery_constant(uint32_t m0) {
 
 // Returns the window size for an exponent of `bits` bits: the number of exponent bits that one
 // product handles. A window of w bits needs about 2^(w-1) products for the table, and about one
-// product for every w + 1 bits of the exponent. The limits keep the sum small. Deliberate: no
-// window has 2 bits. Short exponents have few set bits in practice, so a window of 2 bits would
-// save no time.
+// product for every w + 1 bits of the exponent. The limits below keep the sum of these products
+// small. Deliberate: no window has 2 bits. Short exponents have few set bits in practice, so a
+// window of 2 bits would save no time.
 int window_size(int bits) {
   return bits > 671 ? 6 : bits > 239 ? 5 : bits > 79 ? 4 : bits > 23 ? 3 : 1;
 }

@@ -7,7 +7,7 @@
 
 #include <cstdint>
 
-// Lengths in bytes, numbers big-endian.
+// Lengths are in bytes. The modulus, the exponent and the signatures are big-endian numbers.
 struct pkcs7 {
   const uint8_t* modulus;         // of the certificate's RSA key; one leading zero byte is left out
   const uint8_t* cert_signature;  // the certificate's signatureValue

@@ -1,9 +1,9 @@
 // RSA PKCS#1 v1.5 signature verification (RFC 8017 §8.2.2) with the integers of crypto/mpi.h.
 //
 // A context owns the limbs of its two numbers; an rsa_local releases them. No pointer to the
-// caller's bytes is kept after a call. Of all refusals, only that of a DigestInfo is logged, at
-// error priority. Exception: a DigestInfo that is as long as one for MD5, but has a wrong prefix,
-// is refused without a message.
+// caller's bytes is kept after a call. rsa_pkcs1_verify logs a refusal, at error priority, only if
+// it refuses the DigestInfo. Exception: a DigestInfo that is as long as one for MD5, but has a
+// wrong prefix, is refused without a message.
 #pragma once
 
 #include <cstdint>

@@ -337,8 +337,9 @@ bool ReadExtensionValue(Range extension, bool* critical, Range* value) {
     *critical = hdr.payload[0] != 0;
     // Deliberate: the next header is read from the flag's value byte, not from the byte after it.
     // TRUE in DER is 0xFF. This byte reads as the first octet of a long-form tag of the private
-    // class. The identifier octet of the OCTET STRING then reads as the tag number. FALSE is 0x00,
-    // which reads as tag 0. An extension with a FALSE, which DER omits, is therefore refused.
+    // class. The identifier octet of the OCTET STRING, 0x04, then reads as the tag number 4, which
+    // is the tag of an OCTET STRING. FALSE is 0x00, which reads as tag 0. An extension with a
+    // FALSE, which DER omits, is therefore refused.
     extension = After(from_flag, hdr.payload);
     if (!Next(&extension, &hdr)) return false;
     if (hdr.class_ != kAsn1Universal && hdr.class_ != kAsn1Private) return false;

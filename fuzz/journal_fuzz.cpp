@@ -1,6 +1,6 @@
 // A package influences names and texts in a journal. This target does one of three things with the
 // input, as the simulator does. It escapes a text and reads it back, reads one line of the tool's
-// log, or reads the journal of a whole run. The first byte selects which.
+// log, or reads the journal of a whole run. The first byte of the input selects one of the three.
 #include <algorithm>
 #include <sstream>
 #include <string>
@@ -59,7 +59,8 @@ size_t CountOf(const Events& events, const char* kind, bool is_success) {
   }));
 }
 
-// The record claims no more than the kernel answered, and loses no event.
+// Requires that the record agrees with the kernel's answers in the events, and that it keeps every
+// event.
 void JudgeRecord(const Events& events) {
   const RunRecord record = TakeApart(events);
   Require(record.events == events, "the events are kept");
@@ -84,7 +85,7 @@ void JudgeRecord(const Events& events) {
   Require(record.registrations.size() == CountOf(events, "register", false),
           "each registration is kept");
   Require(record.verify_error != 0 || CountOf(events, "verify", true) > 0,
-          "only the kernel makes a JAR trusted");
+          "a JAR counts as trusted only if the kernel trusted it");
 }
 
 void JudgeJournal(std::string_view bytes) {

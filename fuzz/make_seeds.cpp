@@ -103,8 +103,8 @@ void MakeSignatureBlocks() {
   }());
 }
 
-// fuzz/rsa_fuzz.cpp takes the digests and numbers from the front of the input, and its choices from
-// the back.
+// fuzz/rsa_fuzz.cpp reads the digests and numbers from the start of the input, and its choices from
+// the end.
 void SeedRsa(const std::string& name, Digest digest, size_t length, uint8_t length_choice) {
   const Bytes data = ToBytes("data");
   const Bytes choices = {1, 0 /* exponent 1 */, 1, length_choice, 1};
@@ -221,7 +221,8 @@ void MakeExplanations() {
   SeedExplanation("compiled-manifest", 4, CompiledManifest("com.example.app", true));
 }
 
-// The first byte selects what is read: a text, a line or a run (fuzz/journal_fuzz.cpp).
+// The first byte selects what the fuzz target reads from the other bytes: a text, a line or a run
+// (fuzz/journal_fuzz.cpp).
 void MakeJournals() {
   Seed("journal", "text", Concat({{0}, ToBytes("a\u00fc\u202e\xff\uf7ff\n")}));
   Seed("journal", "line", Concat({{1}, ToBytes("VeltSignJni: File not verified: /a\n")}));

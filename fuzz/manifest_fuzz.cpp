@@ -25,13 +25,13 @@ extern "C" int LLVMFuzzerTestOneInput(const uint8_t* data, size_t size) {
   const std::string text(reinterpret_cast<const char*>(data), size);
   ManifestMf manifest;
   const bool valid = manifest.load(text);
-  Require(valid == static_cast<bool>(manifest), "the object knows the result of load()");
+  Require(valid == static_cast<bool>(manifest), "the object converts to the result of load()");
 
   const ManifestModel expected = ReadManifest(text);
   Require(valid == expected.valid, "both readers accept the text, or both refuse it");
   Require(SectionsOf(manifest) == expected.sections, "both readers find the same sections");
 
   manifest.load(text);
-  Require(SectionsOf(manifest) == expected.sections, "a second load() starts from nothing");
+  Require(SectionsOf(manifest) == expected.sections, "a second load() keeps nothing of the first");
   return 0;
 }

@@ -69,9 +69,9 @@ void Shift(FuzzedDataProvider& input) {
   Expected expected(&x);
   Require(static_cast<size_t>(mpi_msb(&x)) ==
               (mpz_sgn(expected.get()) == 0 ? 0 : mpz_sizeinbase(expected.get(), 2)),
-          "mpi_msb");
+          "mpi_msb returns the bit length that GMP computes");
   mpz_mul_2exp(expected.get(), expected.get(), static_cast<mp_bitcnt_t>(count));
-  Require(mpi_shift_l(&x, count) == 0, "mpi_shift_l");
+  Require(mpi_shift_l(&x, count) == 0, "mpi_shift_l succeeds");
   RequireEqual(&x, expected, "mpi_shift_l shifts");
 }
 
@@ -89,16 +89,16 @@ void AddOrSubtract(FuzzedDataProvider& input) {
   mpz_abs(abs_b.get(), abs_b.get());
   if (input.ConsumeBool()) {
     mpz_add(expected.get(), abs_a.get(), abs_b.get());
-    Require(mpi_add_abs(x, &a, second) == 0, "mpi_add_abs");
+    Require(mpi_add_abs(x, &a, second) == 0, "mpi_add_abs succeeds");
   } else if (mpz_cmp(abs_a.get(), abs_b.get()) < 0) {
-    Require(mpi_sub_abs(x, &a, second) == 16, "mpi_sub_abs refuses");
+    Require(mpi_sub_abs(x, &a, second) == 16, "mpi_sub_abs refuses a negative result");
     RequireEqual(x, before, "a refused mpi_sub_abs changes nothing");
     return;
   } else {
     mpz_sub(expected.get(), abs_a.get(), abs_b.get());
-    Require(mpi_sub_abs(x, &a, second) == 0, "mpi_sub_abs");
+    Require(mpi_sub_abs(x, &a, second) == 0, "mpi_sub_abs succeeds");
   }
-  RequireEqual(x, expected, "sums and differences");
+  RequireEqual(x, expected, "the sum or difference is that of GMP");
   Require(x->s == 1, "the sign of the result is +1");
 }
 
@@ -110,7 +110,7 @@ void MultiplyByLimb(FuzzedDataProvider& input) {
   mpi* const x = input.ConsumeBool() ? &other : &a;
   Expected expected(&a);
   mpz_mul_ui(expected.get(), expected.get(), limb);
-  Require(mpi_mul_int(x, &a, limb) == 0, "mpi_mul_int");
+  Require(mpi_mul_int(x, &a, limb) == 0, "mpi_mul_int succeeds");
   RequireEqual(x, expected, "mpi_mul_int multiplies");
 }
 
@@ -118,7 +118,7 @@ void MultiplyAndAdd(FuzzedDataProvider& input) {
   std::vector<uint32_t> s = Limbs(input, 40);
   if (s.empty()) s.push_back(0);
   const auto b = input.ConsumeIntegral<uint32_t>();
-  // One limb more than the sum can need.
+  // d has one limb more than the sum can need.
   Number d;
   std::vector<uint32_t> sum = Limbs(input, s.size());
   sum.resize(s.size() + 2);
@@ -142,7 +142,7 @@ void Remainder(FuzzedDataProvider& input) {
     return;
   }
   mpz_mod(expected.get(), expected.get(), divisor.get());
-  Require(mpi_mod_mpi(r, &a, &b) == 0, "mpi_mod_mpi");
+  Require(mpi_mod_mpi(r, &a, &b) == 0, "mpi_mod_mpi succeeds");
   RequireEqual(r, expected, "mpi_mod_mpi divides");
 }
 

@@ -220,7 +220,7 @@ void RunTool(const std::string& path) {
 }  // namespace
 
 // The tool never closes its archive, because its process ends. The fuzz target's process continues,
-// so it keeps the archives and closes them after each run.
+// so the target keeps the archives and closes them after each run.
 extern "C" {
 int32_t __real__Z13OpenArchiveFdiPKcPP10ZipArchiveb(int, const char*, ZipArchiveHandle*, bool);
 int32_t __wrap__Z13OpenArchiveFdiPKcPP10ZipArchiveb(int fd, const char* name,

@@ -22,8 +22,8 @@ using Items = std::vector<ZipItem>;
 constexpr size_t kMostItems = 64;
 constexpr size_t kLongestItem = 1 << 16;
 
-// The entries in the order of their data, without those that are too long or cannot be extracted.
-// Empty if the archive cannot be read.
+// Returns at most kMostItems entries, in the order of their data. Leaves out entries that are too
+// long or cannot be extracted. Returns no entries if the archive cannot be read.
 Items ReadItems(const Bytes& bytes) {
   ZipArchiveHandle archive = nullptr;
   void* cookie = nullptr;

@@ -48,7 +48,8 @@ extern "C" int LLVMFuzzerTestOneInput(const uint8_t* data, size_t size) {
   Bytes key = untouched;
   const bool verified = apk.VerifyCertificate(block, sha1, sha256, md5, key);
   const Bytes expected = parsed == 0 ? VerifiedKey(record, block, SignatureFile()) : Bytes();
-  Require(verified == !expected.empty(), "verified if and only if libcrypto verifies");
+  Require(verified == !expected.empty(),
+          "VerifyCertificate accepts exactly the blocks that VerifiedKey accepts");
   Require(key == (verified ? expected : untouched),
           "the key is the modulus if verified, else unchanged");
   return 0;

@@ -102,11 +102,11 @@ void CompareWithStrictReader(const pkcs7& record, const Bytes& block) {
   StrictBlock strict;
   if (!ReadStrictly(block, &strict)) return;
   Require(Same(strict.tbs, record.tbs_data, record.tbs_data_length),
-          "both readers find the same signed part");
+          "both readers find the same signed part of the certificate");
   Require(Same(strict.certificate_signature, record.cert_signature, record.cert_signature_length),
           "both readers find the same signature of the certificate");
   Require(Same(strict.encrypted_digest, record.signed_digest, record.signed_digest_length),
-          "both readers find the same signature of the signer");
+          "both readers find the same signature in the SignerInfo");
   if (CBS_len(&strict.exponent) > sizeof(record.exponent)) return;
   Require(std::equal(CBS_data(&strict.exponent),
                      CBS_data(&strict.exponent) + CBS_len(&strict.exponent), record.exponent),

@@ -13,7 +13,7 @@
 Bytes VerifiedKey(const pkcs7& record, const Bytes& block, const Bytes& signature_file);
 
 // Requires that the record has the signed bytes, signatures, modulus and exponent that a strict DER
-// reader finds. Checks nothing if that reader does not read the block, for example because the
+// reader finds. Checks nothing if the strict reader refuses the block, for example because the
 // signer has authenticated attributes. Checks neither the exponent nor the modulus if the exponent
 // is longer than the record's field.
 void CompareWithStrictReader(const pkcs7& record, const Bytes& block);

@@ -11,9 +11,9 @@
 inline constexpr char kFuzzKey[] = "rsa-512";
 
 // Writes good signatures into the signature block: the certificate's signature, and the signer's
-// signature over the signature file. The block keeps its length and all other bytes. Leaves out a
-// signature that does not fit. Does nothing if the block does not parse, if its modulus is not the
-// fuzz key's, or if its exponent has no inverse.
+// signature over the signature file. The block keeps its length and all other bytes. Does not write
+// a signature that would end beyond the block. Does nothing if the block does not parse, if its
+// modulus is not the fuzz key's, or if its exponent has no inverse.
 void SignAgain(Bytes& block, const Bytes& signature_file);
 
 // Writes the correct digests into the text. The length of the text does not change. Only the

@@ -16,9 +16,10 @@ namespace ApkTools {
 namespace {
 
 // The starts of the lines that the tool's code logs for a refusal, and the reason that each line
-// gives. A refusal logs at most one of these lines, possibly twice. The exception is a manifest
-// that does not parse. The parser then logs "Parse manifest: ", as for a signature file, and its
-// caller logs "Can't load manifest: ". The line that was logged last therefore gives the reason.
+// gives. A refusal logs lines of at most one row, and can log the same line twice. The exception is
+// a manifest that does not parse. The parser then logs "Parse manifest: ", as for a signature file,
+// and its caller logs "Can't load manifest: ". The line that was logged last therefore gives the
+// reason.
 constexpr struct LoggedReason {
   const char* start;
   Reason reason;
@@ -131,7 +132,8 @@ bool HasEntry(Apk& apk, const std::string& prefix, const std::string& suffix) {
 __attribute__((format(printf, 3, 0))) int HearAndLog(int priority, const char* tag,
                                                      const char* format, va_list arguments) {
   char text[kLogTextSize];
-  // NOLINTNEXTLINE(clang-analyzer-valist.Uninitialized): it enters LogText, but misses va_start.
+  // The analyzer does not see that each caller calls va_start.
+  // NOLINTNEXTLINE(clang-analyzer-valist.Uninitialized)
   vsnprintf(text, sizeof(text), format, arguments);
   if (tag != nullptr && strcmp(tag, kLogTag) == 0) Hear(text);
   return __android_log_write(priority, tag, text);
@@ -150,7 +152,8 @@ void Hear(std::string_view text) {
 }  // namespace ApkTools
 
 // This definition replaces the platform's in the whole program, also for calls from the platform's
-// libraries. A text that is longer than a log record is cut at the same place as in the log.
+// libraries. A text that is too long for a log record is cut at kLogTextSize, as the platform's
+// function cuts it.
 extern "C" int __android_log_print(int priority, const char* tag, const char* format, ...) {
   va_list arguments;
   va_start(arguments, format);

@@ -1,11 +1,12 @@
 // A library with which other programs verify packages. Each Verification verifies one package,
 // reports the reason for a refusal, and releases the archive.
 //
-// The tool's own code decides, and reports the reason only in the Android log. This library
-// therefore reads each line that the code logs, and passes the line on to the log unchanged. To
-// read the lines, it defines __android_log_print for the whole program. Link this library into
-// programs only. In a shared library, calls of __android_log_print can reach the platform's
-// function instead. The reasons for refusals are then wrong or kUnknown.
+// The tool's own code decides whether a package is good, and reports the reason for a refusal only
+// in the Android log. This library therefore reads each line that the code logs, and passes the
+// line on to the log unchanged. To read the lines, the library defines __android_log_print for the
+// whole program. Link this library into programs only. In a shared library, calls of
+// __android_log_print can reach the platform's function instead. The reasons for refusals are then
+// wrong or kUnknown.
 #pragma once
 
 #include <optional>
@@ -27,7 +28,7 @@ enum class Reason {
   kSignatureFileMalformed,     // the signature file does not parse
   kNoRsaBlock,                 // the signature block "*.RSA" is missing, or cannot be extracted
   kBlockMalformed,             // the block does not parse, or its key is not RSA
-  kKeyRefused,                 // the key is cut off, or has the exponent 1 or -1
+  kKeyRefused,                 // the key ends beyond the block, or has the exponent 1 or -1
   kCertificateRefused,         // not signed with its own key, or its key or digest is unsupported
   kSignatureRefused,           // the block's signature does not cover the signature file
   kManifestRefused,            // the signature file has no digest of the manifest, or a wrong one

@@ -21,11 +21,13 @@ bool IsOnReadOnlyFileSystem(int fd) {
 
 int main(int argc, char* argv[]) {
   if (argc != 2) return 1;
-  // Deliberate: does not wait for a FIFO's writer. A FIFO is not an archive.
+  // Deliberate: OpenForReading does not wait for the writer of a FIFO, because a FIFO is not an
+  // archive.
   const int fd = OpenForReading(argv[1], 0);
-  // Deliberate: descriptor 0 is refused like a failed open. It means that the caller closed
-  // standard input, which the install path never does. Nothing can be signed on a read-only file
-  // system, so the tool ends without an error. The end of the process closes the descriptor.
+  // Deliberate: descriptor 0 is refused like a failed open. A file gets descriptor 0 only if the
+  // caller closed standard input, and the install service never does this. Nothing can be signed on
+  // a read-only file system, so the tool ends without an error. The end of the process closes the
+  // descriptor.
   if (fd < 1 || IsOnReadOnlyFileSystem(fd)) return 0;
 
   ApkTools::Apk apk(fd);

@@ -60,8 +60,8 @@ uint32_t VeltSignJni(ApkTools::Apk& apk, int fd, const char* /*path*/) {
 
 namespace {
 
-// Signs `fd`, which is the file of `apk` or one of its libraries. `apk` decides between the payload
-// of a package and that of a plain JAR.
+// Signs `fd`, which is the file of `apk` or one of its libraries. If `apk` is a package, the
+// payload is that of a package. Otherwise it is that of a plain JAR.
 uint32_t VeltSignOat(ApkTools::Apk& apk, int fd) {
   return apk.IsApk() ? SignAsPackage(apk, fd) : SignAsJar(apk, fd);
 }

@@ -355,8 +355,8 @@ int MissFile() {
   return kUsageError;
 }
 
-// Returns why the name is not accepted; empty if it is. A script passes an empty name if it uses a
-// variable that is not set.
+// Returns why the name is not accepted; empty if the name is accepted. A script passes an empty
+// name if it uses a variable that is not set.
 std::string WhyNoName(const std::string& name) {
   return name.empty() ? "the name is empty" : std::string();
 }

@@ -33,9 +33,9 @@ int OpenForReading(const char* path, int flags) {
   const int fd = open(path, O_RDONLY | O_NONBLOCK | flags);
   if (fd >= 0 || errno != EWOULDBLOCK) return fd;
   // A process holds a lease on the file. An open without O_NONBLOCK waits until the lease ends. But
-  // if a FIFO was put at the path meanwhile, this open would wait for a writer. The path is
-  // therefore opened with O_PATH, which does not wait. If it leads to a regular file, that file is
-  // opened for reading through the O_PATH descriptor.
+  // if a FIFO was put at the path meanwhile, this open would wait for a writer. OpenForReading
+  // therefore first opens the path with O_PATH, which does not wait. If the O_PATH descriptor
+  // refers to a regular file, OpenForReading opens this file for reading through the descriptor.
   const ScopedFd pinned(open(path, O_PATH | O_CLOEXEC));
   struct stat state = {};
   if (pinned.get() < 0 || fstat(pinned.get(), &state) != 0 || !S_ISREG(state.st_mode)) return -1;

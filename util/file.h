@@ -8,8 +8,8 @@
 #include <string>
 #include <vector>
 
-// True if both states, from fstat, are of the same regular file with equal size, mtime and ctime.
-// Some changes of a file's bytes leave the size and both times unchanged
+// True if both states, from stat or fstat, are of the same regular file with equal size, mtime and
+// ctime. Some changes of a file's bytes leave the size and both times unchanged
 // (docs/decisions/the-file-that-was-read.md).
 bool IsSameFile(const struct stat& before, const struct stat& after);
 

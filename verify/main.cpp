@@ -43,8 +43,8 @@ int main(int argc, char* argv[]) {
 
 namespace {
 
-// True if there is at least one file and no option. The program has no options, and does not treat
-// an option as a file's name.
+// True if there is at least one file and no option. The program has no options. An argument that
+// begins with "-" is refused, and is not treated as a file's name.
 bool IsCommandLineRight(int argc, char* argv[]) {
   for (int i = 1; i < argc; ++i) {
     if (argv[i][0] == '-') return false;

@@ -2,10 +2,11 @@
 // file LIST has a line "DIGEST[,DIGEST]... PATH" for each file of each package. The digests name
 // the signers that the package manager knows (SignerDigests.java). DIRECTORY contains apktoolkit,
 // apktoolkit-bound and apktoolkit-verify, for example /system/bin. The program prints the outcome
-// for each package.
+// for each file in LIST.
 //
-// Files that the kernel already trusts are left out, so an interrupted run can be started again.
-// Exit status: 0 if all packages are trusted, 1 if some are not, 2 if the command line is wrong,
+// apktoolkit is not run for files that the kernel already trusts. An interrupted run can therefore
+// be started again.
+// Exit status: 0 if all files are trusted, 1 if some are not, 2 if the command line is wrong,
 // the list cannot be opened or read to its end, or one of its lines is malformed.
 #include <algorithm>
 #include <cerrno>

@@ -1,12 +1,14 @@
-// Signs an installed package, as an installer does: checks the signers, runs apktoolkit, and asks
-// the kernel for the result. The code keeps no state and logs nothing, and any thread may call it.
+// An installer calls this code to sign an installed package. The code checks the signers, runs
+// apktoolkit, and asks the kernel for the result. It keeps no state and logs nothing. Any thread
+// may call it.
 //
 // Call SignPackage during an install when the package has its final path and its native libraries
 // are beside it. It must be called before any code of the package is run, mapped, or compiled ahead
-// of time (dexopt). From the call on, nobody may write to the package or beside it. The caller must
-// not hold a lock: the call runs up to three programs in turn, and each run can take the whole time
-// limit. After an update of the system, the kernel can refuse to trust files that it signed before.
-// SignPackage must therefore be called again for every installed package (main.cpp).
+// of time (dexopt). From the start of the call on, nobody may write to the package or to files
+// beside it. The caller must not hold a lock: the call runs up to three programs in turn, and each
+// run can take the whole time limit. After an update of the system, the kernel can refuse to trust
+// files that it signed before. SignPackage must therefore be called again for every installed
+// package (main.cpp).
 #pragma once
 
 #include <string>

@@ -313,7 +313,8 @@ static int look_up_entered(struct kprobe *probe, struct pt_regs *registers)
 	return 1;
 }
 
-/* A post handler keeps the kernel from replacing the probe by a jump. A jump cannot redirect. */
+/* Does nothing. The kernel can replace the breakpoint of a probe by a jump, but not if the probe
+ * has a post handler. A handler that is reached by such a jump cannot redirect the call. */
 static void after(struct kprobe *probe, struct pt_regs *registers, unsigned long flags)
 {
 }

@@ -23,7 +23,7 @@ int journal_open(void)
 
 static __printf(1, 2) void write_line(const char *format, ...)
 {
-	loff_t end = 0; /* O_APPEND sets the position */
+	loff_t end = 0; /* ignored: O_APPEND writes at the end of the file */
 	va_list arguments;
 	char *line;
 

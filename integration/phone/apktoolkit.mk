@@ -1,6 +1,7 @@
 # For a product's makefile:
 #   $(call inherit-product, external/apktoolkit/integration/phone/apktoolkit.mk)
-# This also installs libzu: the product's own library or the stub (docs/porting.md).
+# The build also installs libzu, because apktoolkit links it. The library is the product's own or
+# the stub (docs/porting.md).
 PRODUCT_PACKAGES += \
     apktoolkit \
     apktoolkit-all \

@@ -18,10 +18,10 @@ import java.util.Set;
  * Names the current RSA signers that the package manager knows for a package, by the same digest
  * that apktoolkit passes to the kernel. Use this class in the process that installs packages.
  *
- * <p>The package manager uses the newest signing block that it knows. apktoolkit uses the JAR
- * signature, whose signer can be a different one. Pass a package to apktoolkit only if its JAR
- * signer is one of the package manager's signers. To check this, run apktoolkit-bound, or call
- * {@link #isAmong}.
+ * <p>Of a package's signature schemes, the package manager uses the newest one that it knows.
+ * apktoolkit uses the JAR signature, whose signer can be a different one. Pass a package to
+ * apktoolkit only if its JAR signer is one of the package manager's signers. To check this, run
+ * apktoolkit-bound, or call {@link #isAmong}.
  */
 public final class SignerDigests {
     private SignerDigests() {}

@@ -1,14 +1,15 @@
 // apktoolkit-bound DIGESTS COMMAND... FILE: runs `COMMAND... FILE` if the JAR signer of the package
-// FILE is one of the signers that the package manager knows for this package. Otherwise it ends
-// with one of its own exit statuses.
+// FILE is one of the signers that the package manager knows for this package. Otherwise this
+// program ends with one of its own exit statuses.
 //
 // The package manager uses the APK signing block (v2 or later) of a package that has one.
 // apktoolkit always uses the JAR signature. No other program on the phone compares the signers of
 // these two signatures (docs/threat-model.md, "Before you ship it"). DIGESTS comes from
 // SignerDigests.java: for each RSA signer that the package manager knows, the SHA-256 digest of the
 // modulus, in lower-case hexadecimal, separated by commas. This program finds the JAR signer with
-// the tool's own code, so it finds the same signer as the tool. It is not a part of its caller,
-// because the tool's code ends the process if memory runs out, and does not free all of its memory.
+// the tool's own code, so it finds the same signer as the tool. It is a separate program, and not a
+// part of the program that calls it, for two reasons. The tool's code ends the process if memory
+// runs out, and does not free all of its memory.
 #include <fcntl.h>
 #include <unistd.h>
 
@@ -33,7 +34,8 @@ constexpr int kNoJarSigner = 4;
 constexpr int kNotStarted = 5;
 
 // Returns the digest of the signer's key. The tool passes the same digest to the kernel. Returns an
-// empty text if the file cannot be opened, is not a package, or has no good JAR signature.
+// empty text if the file cannot be opened, is not a package, or has no signature file with a good
+// signature. The digests in the signature file and the manifest are not considered.
 std::string JarSigner(const char* file) {
   const ScopedFd fd(OpenForReading(file, O_CLOEXEC));
   if (fd.get() < 0) return {};

@@ -2,8 +2,8 @@
 //
 // Arguments: the first and the last API level of the phones. Standard input: the paths of packages,
 // one per line. The answer to each path is one line on standard output, a JSON object in ASCII. The
-// program ends at the end of its input. The object has the answers for ranges of API levels
-// (docs/journal.md), or "failure", the reason why the verifier has no answer.
+// program ends at the end of its input. The member "ranges" of the object has the answers for
+// ranges of API levels. If the verifier has no answer, the object has only "failure", the reason.
 
 import com.android.apksig.ApkVerifier;
 import com.android.apksig.apk.ApkFormatException;
@@ -60,7 +60,7 @@ public final class InstallerVerifier {
         }
     }
 
-    // A failure of the verifier for one file must not end the answers for the other files.
+    // If the verifier fails for one file, the program must still answer for the other files.
     private static String answer(File file, int first, int last) {
         try (RandomAccessFile opened = new RandomAccessFile(file, "r")) {
             DataSource source = DataSources.asDataSource(opened);
@@ -76,7 +76,7 @@ public final class InstallerVerifier {
         }
     }
 
-    // The lowest level at which phones install the package; 1 if it cannot be read.
+    // The lowest level at which phones install the package; 1 if the manifest cannot be read.
     private static int lowestLevel(DataSource source) {
         try {
             return ApkUtils.getMinSdkVersionFromBinaryAndroidManifest(
@@ -144,7 +144,7 @@ public final class InstallerVerifier {
         }
     }
 
-    // Phones verify the package by a scheme that this version of apksig does not know.
+    // Thrown if phones verify the package by a scheme that this version of apksig does not know.
     private static final class UnknownScheme extends Exception {
         private static final long serialVersionUID = 1;
 
@@ -341,8 +341,8 @@ public final class InstallerVerifier {
             }
         }
 
-        // Ignores levels that no phone has. Such a level means that the range has no beginning or
-        // no end.
+        // Ignores levels that no phone has. Such a level means that the signer's range has no
+        // beginning or no end.
         private static void addLevel(long level, SortedSet<Integer> starts) {
             if (level > 0 && level < NO_PHONES_LEVEL) {
                 starts.add((int) level);
@@ -350,8 +350,8 @@ public final class InstallerVerifier {
         }
 
         // The value of the block's first pair with this ID, or null. The fields of a pair: a length
-        // of 8 bytes, an ID of 4 bytes, and the value. Before the pairs is the block's size (8
-        // bytes), and after them are the size again and the magic (24 bytes).
+        // of 8 bytes, an ID of 4 bytes, and the value. The block begins with its size (8 bytes),
+        // which the pairs follow. It ends with the size again and the magic (24 bytes together).
         private static ByteBuffer find(DataSource source, int wanted) {
             try {
                 ApkUtils.ZipSections sections = ApkUtils.findZipSections(source);

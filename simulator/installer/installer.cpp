@@ -20,7 +20,7 @@ namespace simulator {
 
 namespace {
 
-// The path of apksig, the library that verifies.
+// The path of apksig, the library that verifies the packages.
 constexpr char kVerifierLibrary[] = APKTOOLKIT_APKSIG;
 constexpr char kClass[] = "InstallerVerifier";
 
@@ -44,8 +44,8 @@ std::optional<std::string> Installer::Missing() const {
   return {};
 }
 
-// The Java program reads one path per line, but a file's own name can contain a line feed. The
-// program therefore gets the path of this process's descriptor.
+// The Java program reads one path per line, but a file's own name can contain a line feed. The Java
+// program therefore gets a path in /proc, which leads to this process's descriptor of the file.
 Judgement Installer::Judge(const std::string& file) {
   if (options_.use == InstallerUse::kOff) return {};
   const ScopedFd opened(open(file.c_str(), O_RDONLY | O_CLOEXEC | O_NONBLOCK | O_NOCTTY));

@@ -1,7 +1,7 @@
 // The installer of the phones: the platform's own verifier, apksig, in a Java program
-// (InstallerVerifier.java). One process of this program answers for all packages of a run whether
-// phones install them, unless it fails. It is started for the first package. After it fails on a
-// package, the next package starts a new process.
+// (InstallerVerifier.java). The first package of a run starts a process of this program. The
+// process says for each package whether phones install it. If the process fails on a package, the
+// next package starts a new process.
 #pragma once
 
 #include <sys/types.h>
@@ -16,7 +16,7 @@
 
 namespace simulator {
 
-// kAuto: the installer is asked if its verifier is installed. kRequired: without the verifier, the
+// kAuto: if the verifier is installed, the installer is asked. kRequired: without the verifier, the
 // run fails. kOff: the installer is never asked.
 enum class InstallerUse { kAuto, kRequired, kOff };
 
@@ -31,7 +31,7 @@ class Installer {
  public:
   // `options` must outlive this object.
   explicit Installer(const InstallerOptions& options) : options_(options) {}
-  // Ends the process.
+  // Ends the Java process if it runs.
   ~Installer() { Stop(); }
   Installer(const Installer&) = delete;
   Installer& operator=(const Installer&) = delete;
@@ -40,9 +40,9 @@ class Installer {
   // build. Otherwise returns none.
   std::optional<std::string> Missing() const;
 
-  // Asks the phones' installer about the file. The result is kNotAsked for a file that is not a
-  // package, and for every file with kOff. Several threads may call Judge; the packages are judged
-  // one after the other.
+  // Asks the phones' installer about the file. The result is kNotAsked for a file that cannot be
+  // opened or is not a package, and for every file with kOff. Several threads may call Judge; the
+  // packages are judged one after the other.
   Judgement Judge(const std::string& file);
 
  private:

@@ -11,13 +11,13 @@
 
 namespace simulator {
 
-// Phones, by the API levels of their platforms.
+// The phones whose platforms have the API levels from `first` to `last`, both included.
 struct LevelRange {
   int first;
   int last;
 };
 
-// The last level of a range that has no end.
+// The value of `last` in a range without an upper limit.
 inline constexpr int kNewestLevel = INT_MAX;
 
 // An error or a warning of apksig.
@@ -45,9 +45,9 @@ struct RangeJudgement {
 
 struct Judgement {
   enum class State {
-    kNotAsked,  // nobody asked, or the file cannot be opened or is not a package
+    kNotAsked,  // the verifier was not asked, for example because the file is not a package
     kMissing,   // the verifier is not installed
-    kGaveUp,    // the verifier gave no valid answer, or none in time
+    kGaveUp,    // the verifier gave no valid answer, or no answer before the deadline
     kJudged,
   };
 

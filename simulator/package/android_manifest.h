@@ -20,8 +20,8 @@ struct AndroidManifest {
   // The package's name by the installer's rules: the root's attribute "package" without a
   // namespace. UTF-8, up to the first NUL.
   std::string installer_name;
-  // The attribute extractNativeLibs of the first application; none if this application has no such
-  // attribute with a boolean or integer value.
+  // The attribute extractNativeLibs of the first <application> element; none if this element has no
+  // such attribute with a boolean or integer value.
   std::optional<bool> extracts_libraries;
 };
 

@@ -67,7 +67,8 @@ EntryDigest Compare(Archive* archive, const EntryDigests& manifest, const Archiv
   return IsKnownDigest(digest_name, tool) ? EntryDigest::kDiffers : EntryDigest::kNotCompared;
 }
 
-// True if the tool accepts the SHA-1 digest of an empty text under this name.
+// True if `name` is the name of a SHA-1 digest: the tool then accepts the SHA-1 digest of an empty
+// text.
 bool IsSha1Digest(const std::string& name, Apk* tool) {
   std::vector<uint8_t> sha1;
   ComputeSHA1Digest({}, sha1);

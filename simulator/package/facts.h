@@ -39,7 +39,7 @@ struct LibraryFacts {
   // The path at which the tool looks for the file, relative to the package's directory; empty:
   // `entry` does not begin with the directory of an Arm ABI.
   std::string place;
-  bool is_met = true;          // true if the tool reaches `entry`; a damaged entry stops it
+  bool is_met = true;          // the tool reaches `entry`; a damaged entry stops the tool
   int error = 0;               // errno of opening the file; 0: it can be opened, or no `place`
   bool has_directory = false;  // the file's directory exists
 };

@@ -19,7 +19,7 @@ namespace simulator {
 // another key.
 struct ToolKey {
   std::string modulus_sha256;  // the digest in the payload; in hexadecimal
-  uint32_t size = 0;           // of the modulus, in bytes, as the tool counts them
+  uint32_t size = 0;           // of the modulus in bytes, as the tool reads it
   int bits = 0;
   int32_t exponent = 0;
   bool is_forgeable = false;  // anyone can make its signatures
@@ -39,7 +39,7 @@ struct JarSignatureFacts {
   // None if the tool cannot read a key.
   std::optional<ToolKey> key;
 
-  SignatureBlockFacts block;  // as a strict reader finds it; its certificate is not kept
+  SignatureBlockFacts block;  // read as strict DER; its member `certificate` is always empty
   // The first certificate; none if it cannot be parsed, or if the tool reads the key from another
   // certificate.
   std::optional<CertificateFacts> certificate;

@@ -91,7 +91,7 @@ int Verify(int fd) {
   return Answer(&event, error, errno_before);
 }
 
-// The kernel does not accept a descriptor that names a file without having opened it (O_PATH).
+// A descriptor that was opened with O_PATH only names a file. The kernel does not accept it.
 int DescriptorError(int fd) {
   const int flags = fcntl(fd, F_GETFL);
   return flags < 0 || (flags & O_PATH) != 0 ? EBADF : 0;

@@ -46,8 +46,8 @@ struct PhoneSettings {
 // Reads the settings from this process's environment.
 PhoneSettings SettingsFromEnvironment();
 
-// Returns the settings as NAME=VALUE words. Every setting has a word, so that a variable of the
-// present environment has no effect.
+// Returns the settings as NAME=VALUE words. Every setting has a word, so a variable that this
+// process inherited cannot change a setting.
 std::vector<std::string> SettingsToEnvironment(const PhoneSettings& phone);
 
 }  // namespace simulator

@@ -118,7 +118,7 @@ std::string Installation::WithStablePaths(const std::string& journal) const {
 
 namespace {
 
-// Includes the names of damaged entries.
+// The names of all library entries, including entries that cannot be extracted.
 std::vector<std::string> LibraryNames(const Archive& archive) {
   std::vector<std::string> names;
   for (const ArchiveEntry& entry : archive.Entries()) {

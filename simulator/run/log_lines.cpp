@@ -80,7 +80,8 @@ Pattern MakePattern(const LogText& row);
 LogLine ReadLogLine(const std::string& text) {
   LogLine line;
   line.whole = text.substr(0, text.size() - (!text.empty() && text.back() == '\n' ? 1 : 0));
-  // The log may have cut a line of this length, so only its start can be compared.
+  // The log cuts texts to kLogTextSize - 1 bytes. A text of this length may have lost its end, so
+  // only its start can be compared.
   const bool is_cut = text.size() + 1 >= kLogTextSize;
   for (const Pattern& pattern : Patterns()) {
     const std::string& start = pattern.start;

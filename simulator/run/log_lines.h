@@ -11,7 +11,8 @@ namespace simulator {
 // The meaning of a record of the tool's log. The comment above a group names the parts that
 // LogLine::text captures, if there are any.
 enum class LogMeaning {
-  // kUnknown: none of the texts. kDetail: a detail of an error that another record also reports.
+  // kUnknown: the record has none of the known texts. kDetail: the record adds a detail to an error
+  // that another record reports.
   kUnknown,
   kDetail,
   // The steps of a run. "Taken up": the tool starts to sign a package, one of its libraries, or a

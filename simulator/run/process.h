@@ -8,10 +8,10 @@
 namespace simulator {
 
 // Reserves the descriptors of closed standard streams, so that no file of this program gets such a
-// descriptor. Returns true if there was a standard input. Programs that this process starts find
-// the streams as they were. After the call, only std::cout writes to standard output. This program
-// also contains code of the tool, and the lines that this code prints are discarded. Call it before
-// anything is printed.
+// descriptor. Returns true if standard input was open before. Programs that this process starts
+// find the streams as they were before. After the call, only std::cout writes to standard output.
+// This program also contains code of the tool, and the lines that this code prints are discarded.
+// Call it before anything is printed.
 bool KeepStandardStreams();
 
 // After this call, SIGINT, SIGTERM, SIGHUP, SIGQUIT and SIGPIPE do not end the process before it
@@ -23,7 +23,7 @@ void EndIfInterrupted();
 
 // For posix_spawn: the new process gets a process group of its own. A signal from the keyboard goes
 // to a whole group, but must reach only this process, which then ends the new process. If the
-// signal reached the new process, its end would look like a failure.
+// signal ended the new process, that end would look like a failure of the new process.
 class OwnProcessGroup {
  public:
   OwnProcessGroup();

@@ -27,7 +27,7 @@ struct Attempt {
 
   std::string path;  // from the log or the kernel; can be empty
   Outcome outcome = Outcome::kBegun;
-  int64_t error = 0;                      // the errno of the kernel's refusal or of opening
+  int64_t error = 0;                      // the errno of the kernel's refusal or of the failed open
   std::string payload;                    // the bytes that the kernel got, in hexadecimal
   std::optional<std::string> integrity;   // the tool's integrity value, as read last; none: no file
   LogMeaning why = LogMeaning::kUnknown;  // the first error logged before the refusal, if any

@@ -19,9 +19,9 @@ namespace simulator {
 
 class SignedBytes {
  public:
-  // `directory` is created if it does not exist; empty: nothing is kept beyond this object. If
-  // `shares` is false, added files are not trusted in this run, so that the order of its files does
-  // not matter. In this case several threads may use the object.
+  // Load() creates `directory` if it does not exist. If `directory` is empty, nothing is kept after
+  // this object is destroyed. If `shares` is false, added files are not trusted in this run, so
+  // that the order of its files does not matter. In this case several threads may use the object.
   SignedBytes(std::string directory, bool shares)
       : directory_(std::move(directory)), shares_(shares) {}
 

@@ -26,7 +26,8 @@ namespace fs = std::filesystem;
 // Why the last system call failed, as the end of a message.
 std::string ErrnoText() { return std::string(": ") + strerrordesc_np(errno); }
 
-// The path by which the kernel knows the file once it is open.
+// The file's absolute path without symbolic links. If they cannot be resolved, only its absolute
+// path.
 std::string Resolved(const std::string& file) {
   std::error_code error;
   const fs::path path = fs::canonical(file, error);
@@ -43,8 +44,9 @@ std::string OwnDescriptorPath(int fd) {
   return "/proc/" + std::to_string(getpid()) + "/fd/" + std::to_string(fd);
 }
 
-// The result for a directory without packages, or for a directory or an entry in it that cannot be
-// read. The tool is not run for these, and the result contains only the reason.
+// The result for a name for which the tool is not run (ListedFile::State): a directory without
+// packages, an unreadable directory, or an unreadable entry of a directory. The result contains
+// only this reason.
 FileRun RunOfDirectory(const ListedFile& directory) {
   FileRun run;
   const std::string path = Resolved(directory.name);

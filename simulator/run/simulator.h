@@ -18,7 +18,7 @@ namespace simulator {
 
 // The phone, and how the tool is run in it.
 struct RunOptions {
-  PhoneSettings phone;             // all but its journal and its trusted files
+  PhoneSettings phone;             // without the journal and the trusted files
   std::vector<std::string> trust;  // existing files that the kernel trusts
   std::string state;               // the directory for --state; an empty text: none
   InstallWhen install = InstallWhen::kAlone;
@@ -46,9 +46,10 @@ class Simulator {
   // it cannot.
   std::optional<std::string> Prepare();
 
-  // Runs the tool for `file` if its state is kToRun. Otherwise the result has only the reason why
-  // the tool was not run. If `jobs` is more than 1, several threads may call this function at the
-  // same time.
+  // Runs the tool for `file` if the state of `file` is kToRun. If the run fails, record.failure has
+  // the reason. For any other state, the result has only the file's name and path, and the reason
+  // why the tool was not run. If `jobs` is more than 1, several threads may call this function at
+  // the same time.
   FileRun Run(const ListedFile& file);
 
  private:

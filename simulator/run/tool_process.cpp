@@ -48,8 +48,8 @@ std::string ProgramDirectory() {
 namespace {
 
 // The kernel's stand-in is loaded only into the tool. If a runner, such as an emulator, starts the
-// tool, the runner itself must not load it. The runner's option -E sets LD_PRELOAD for the tool
-// alone.
+// tool, the runner itself must not load the stand-in. The runner's option -E sets LD_PRELOAD for
+// the tool alone.
 Words CommandWords(const ToolCommand& command, Words* environment) {
   const std::string preload = "LD_PRELOAD=" + command.kernel;
   Words words = command.runner;

@@ -24,8 +24,9 @@ struct ToolEnd {
   int value;  // kExited: the status. kKilled: the signal. kNotStarted: the errno. Otherwise 0.
 };
 
-// Runs the command to its end, or kills it after the deadline. Discards its standard output,
-// because the journal has it. Its standard input and error are those of this process.
+// Runs the command to its end, or kills it after the deadline. Discards the command's standard
+// output, because a stand-in records it in the journal. The command's standard input and standard
+// error are those of this process.
 ToolEnd RunTool(const ToolCommand& command, const Deadline& deadline);
 
 // The program that is started: the runner, or else the tool.

@@ -120,8 +120,8 @@ size_t RankOf(Verdict verdict) {
                              std::begin(kWorstFirst));
 }
 
-// Starts with the decisive reason. If nothing was refused, starts with the signer for whom phones
-// install the package, if that is not the JAR signer. The alarms follow.
+// Starts with the decisive reason. If nothing was refused, but phones install the package for
+// another signer than the JAR signer, starts with that other signer. The alarms follow.
 std::string ReasonText(const Report& report) {
   std::vector<std::string> facts = {DecisiveReason(report)};
   if (facts[0].empty()) facts[0] = OtherOwnerText(report);

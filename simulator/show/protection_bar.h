@@ -1,4 +1,5 @@
-// Draws what the signature protects (Protection) as one bar, and explains the parts of the bar.
+// Computes a bar that shows how much of the package the signature protects (Protection), with an
+// explanation of each part of the bar.
 #pragma once
 
 #include <cstdint>
@@ -19,8 +20,8 @@ struct DrawnPart {
   double width;    // in the same unit; large enough to be seen; 0: no bytes
 };
 
-// Returns the parts in order, from the best protected one to the bytes between the entries. Empty
-// if the file has no entries.
+// Returns the parts in the order of the bar, from the verified entries to the bytes between the
+// entries. Empty if the file has no entries.
 std::vector<DrawnPart> DrawBar(const Protection& protection, uint64_t file_size);
 
 }  // namespace simulator

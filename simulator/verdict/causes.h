@@ -49,7 +49,7 @@ struct Cause {
 
 namespace cause {
 
-// The rows use the full line length, which clang-format would change.
+// The rows fill each line up to its full length. clang-format would wrap them in another way.
 // clang-format off
 
 // ---- The tool did not look at the file.

@@ -153,9 +153,9 @@ std::vector<const CertificateFacts*> NewestSigners(const RangeJudgement& range) 
   return signers;
 }
 
-// The signers for whom any of the phones installs the package, each once, in a fixed order. Without
-// a judgement of the installer, these are the signers of the newest scheme that the file names, or
-// else the JAR signer.
+// The signers for whom any of the phones installs the package, each once, in a fixed order. If the
+// installer did not judge the package, these are the signers of the newest scheme in the file. If
+// the file has only v1, this is the JAR signer.
 Signers InstalledSigners(const Report& report) {
   Signers signers;
   for (const RangeJudgement& range : report.installer.ranges) {

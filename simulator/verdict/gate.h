@@ -30,9 +30,10 @@ class Gate {
 
   // Adds at least one item to the report for each demand that the file does not meet. A good
   // verdict then becomes kNotAccepted. The demand for no warnings is made only if the verdict was
-  // good before. Changes nothing for a file that was not looked at or not simulated. Called once
-  // per file, in the order of the command line, because each verified package is compared with the
-  // first one that has the same package name.
+  // good when Judge was called. The verdict kOtherSigner then counts as a warning. Changes nothing
+  // for a file that was not looked at or not simulated. Called once per file, in the order of the
+  // command line, because each verified package is compared with the first one that has the same
+  // package name.
   void Judge(Report* report);
 
  private:

@@ -9,7 +9,8 @@ namespace simulator {
 
 namespace {
 
-// A library of the package. `attempt` is the tool's attempt to sign it; null if the log has none.
+// A library of the package. `attempt` is the tool's attempt to sign it; null if the RunRecord has
+// none.
 struct Library {
   LibraryFacts facts;
   const Attempt* attempt = nullptr;
@@ -61,7 +62,8 @@ namespace {
 
 // Pairs each library with its attempt. The tool handles the libraries in the order of the zip
 // library's iteration, and `present` has that order. If attempts are left over, the pairs cannot be
-// right. The result then has one library for each attempt, with only a path.
+// right. The result then has one library for each attempt, and the only fact of each library is its
+// path.
 std::vector<Library> MatchAttempts(const RunRecord& run, const std::vector<LibraryFacts>& present) {
   std::vector<Library> libraries;
   auto attempt = run.libraries.begin();

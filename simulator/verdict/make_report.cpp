@@ -84,7 +84,8 @@ std::string Reason::Text() const {
   return at == std::string::npos ? text : text.replace(at, 2, detail);
 }
 
-// If the installer caused the verdict, its item decides. Otherwise the first refused item decides.
+// If the installer caused the verdict, only the installer's item counts. Otherwise every item
+// counts. Returns the first refused item that counts.
 const Item* DecisiveItem(const Report& report) {
   const bool is_installers = report.verdict == Verdict::kNotInstallable ||
                              (report.verdict == Verdict::kNotSimulated && report.items.size() > 1);
@@ -131,8 +132,8 @@ Item OwnItem(const RunRecord& run, const PackageFacts& facts, const JudgeOptions
   return item;
 }
 
-// The kind that the tool saw. A file that it could not open as an archive is neither a package nor
-// a JAR. Only a JAR is signed with an empty payload.
+// The kind that the tool saw. A file that the tool could not open as an archive is neither a
+// package nor a JAR. Only the payload of a JAR has no digest (kNoData).
 ItemKind KindOf(const RunRecord& run) {
   constexpr char kNoData[] = "0000";
   if (run.is_jar || (run.own && run.own->payload == kNoData)) return ItemKind::kJar;
@@ -152,7 +153,7 @@ Reason WhyJarRefused(const RunRecord& run, const PackageFacts& facts) {
   return {&cause::kJarNotTrusted, DescribeErrno(run.verify_error.value_or(0))};
 }
 
-// A null cause if nothing failed.
+// The result has a null cause if nothing failed.
 Reason WhyFailed(const Failure& failure) {
   constexpr const Cause* kCauses[] = {nullptr,
                                       &cause::kToolNotStarted,
@@ -228,9 +229,9 @@ Verdict JudgeWithInstaller(Verdict verdict, const Report& report) {
   return verdict == Verdict::kSigned && has_other ? Verdict::kOtherSigner : verdict;
 }
 
-// Fills in the payload, the package's name, the signers and the key. The key is the key that the
-// kernel got with the package, or else with a library. If the kernel got no key, it is the key that
-// the tool's own code reads from the file.
+// Fills in the payload, the package's name, the signers and the key. The report shows the key whose
+// digest the kernel got with the package, or else with a library. If the kernel signed without such
+// a digest, or did not sign, the report shows the key that the tool's own code reads from the file.
 void DescribeSigners(const RunRecord& run, const PackageFacts& facts, Report* report) {
   constexpr char kDigestFollows[] = "2000";  // the digest's length, 32, the low byte first
   const auto take = [report](const Attempt& attempt) {
@@ -252,7 +253,7 @@ void DescribeSigners(const RunRecord& run, const PackageFacts& facts, Report* re
   report->key = {digest, is_read ? report->key->bits : 0, true};
 }
 
-// Under --strict a doubt counts as a refusal.
+// Under --strict, a warning of the severity kDoubt counts as a refusal.
 void AddWarnings(const std::vector<Reason>& warnings, const JudgeOptions& options, Report* report) {
   for (const Reason& warning : warnings) {
     if (options.is_strict && warning.cause->severity == Severity::kDoubt) {

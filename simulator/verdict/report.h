@@ -57,7 +57,8 @@ struct Reason {
   std::string Text() const;
 };
 
-// One thing that had to be signed or registered, or a party that refuses the whole file.
+// One thing that had to be signed or registered. The kinds kEntries, kTool, kInstaller, kSigner and
+// kWarnings are for other reasons to refuse the file.
 struct Item {
   ItemKind kind;
   std::string name;   // of a library: its path below the package's directory; of a key: the
@@ -132,8 +133,9 @@ struct Report {
 // verdict, else the first refused item. Null if nothing was refused.
 const Item* DecisiveItem(const Report& report);
 
-// Returns the signer for whom the newest phones that install the package install it, if this is not
-// the JAR signer. Otherwise returns null. Reads only the signer and the key of the report.
+// Returns a signer for whom the newest phones that can install the package install it, and who is
+// not the JAR signer. Null if there is no such signer. Reads only the signer and the key of the
+// report.
 const CertificateFacts* OtherSigner(const Judgement& judgement, const Report& report);
 
 // True for an item of the tool's own run. All other items are about the phones' installer or

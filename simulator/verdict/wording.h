@@ -31,9 +31,9 @@ inline std::string CountedNames(const std::vector<std::string>& names) {
 // The range in words: "API 27 and later".
 std::string LevelText(const LevelRange& levels);
 
-// If all phones about which apksig (the platform's verifier) was asked install the package, names
-// them, and the schemes by which they verify its signer: "phones of API 27 and later install it,
-// verified by v2, v3". Otherwise empty.
+// Names the phones about which apksig (the platform's verifier) was asked, and the schemes by which
+// they verify the package: "phones of API 27 and later install it, verified by v2, v3". Empty if
+// some of these phones do not install the package, or if apksig gave no judgement.
 std::string TakersText(const Judgement& judgement);
 
 // The algorithm and size of the JAR signer's key, such as "RSA-2048". They come from report.key, or

@@ -251,8 +251,8 @@ TEST(AndroidManifestAttribute, LoneStringWithoutTextCountsAsMissing) {
 }
 
 // ---- Unpaired surrogates. The platform drops them when it converts a text to UTF-8. The tool
-// converts only the package's name. It compares every other text with at most 16 unpaired
-// surrogates as if it were converted.
+// converts only the package's name. All other texts are only compared. If such a text has at most
+// 16 unpaired surrogates, the comparison ignores them, as a conversion would.
 
 const std::string kHigh = "\xED\xA0\x80", kLow = "\xED\xB0\x80";  // U+D800, U+DC00
 

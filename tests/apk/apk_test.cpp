@@ -1,4 +1,5 @@
-// Tests Init: the flags that it sets, and the steps that verify a package.
+// Tests Init: the flags that it sets, and the steps that verify a package. Also tests which digest
+// counts if a section of the manifest has two.
 #include "apk/apk.h"
 
 #include <fcntl.h>

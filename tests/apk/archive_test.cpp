@@ -66,7 +66,8 @@ TEST(ApkIteration, FilterOf65536BytesIsAnInvalidName) {
 
 // ---- Entries with false headers or damaged data.
 
-// The log message for a package with this Android manifest; empty if there is not exactly one.
+// The log message for a package with this Android manifest; empty if the number of messages is not
+// one.
 std::string LogOfAndroidManifest(const ZipItem& item) {
   Package package = MakePackage(WithoutDex());
   package.Item(kAndroidManifestName) = item;

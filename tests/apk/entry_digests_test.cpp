@@ -99,9 +99,9 @@ std::string With64Between(const std::string& letters) {
 // In the first family, all names have the same hash. In the second, the three long names have the
 // same hash. In the third, the two names of 8 characters have the same hash, and the two long names
 // have the same hash. In the names of 8 characters, seven rotations follow the first character.
-// They rotate it by 63 bits to the left, which equals one bit to the right. It then meets the
-// eighth character: "b" (0x62) becomes 0x31, and 0x31 ^ "q" (0x71) is 0x40. "d" (0x64) becomes
-// 0x32, and 0x32 ^ "r" (0x72) is also 0x40.
+// They rotate it by 63 bits to the left, which equals one bit to the right. The hash is then
+// combined with the eighth character by XOR: "b" (0x62) becomes 0x31, and 0x31 ^ "q" (0x71) is
+// 0x40. "d" (0x64) becomes 0x32, and 0x32 ^ "r" (0x72) is also 0x40.
 TEST(EntryDigests, NamesWithEqualHashesAreDistinguished) {
   const std::vector<std::string> families[] = {
       {With64Between("abc"), With64Between("acb"), With64Between("bac"), With64Between("bca"),

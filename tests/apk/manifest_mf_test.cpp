@@ -17,7 +17,7 @@ namespace {
 using Section = std::map<std::string, std::string>;
 using Sections = std::vector<Section>;
 
-// Copies the sections into maps. The attributes must be in order before that, because a map would
+// Copies the sections into maps. First checks that the attributes are in order, because a map would
 // hide a wrong order.
 Sections SectionsOf(const ManifestMf& manifest) {
   Sections sections;

@@ -130,8 +130,9 @@ TEST(ManifestSection, LastOfEqualNamesCounts) {
 
 // Two long names that differ only in their last byte come before very many short names. The
 // addition of the second long name compares the long names once. While the short names are added,
-// the long names are unreadable, so a comparison would crash. The long names must not be compared
-// again before the text has advanced, from the start of the second name, by the length of both.
+// the long names are unreadable, so a comparison would crash. The long names may be compared again
+// only after more text: at least as many bytes as both names have together, counted from the start
+// of the second name.
 TEST(ManifestSection, LongNamesAreNotComparedAgainForEachShortName) {
   constexpr uint32_t kLength = 1 << 20;
   constexpr size_t kAll = 3 * kLength;

@@ -148,8 +148,8 @@ Bytes DocumentOfOverlappingStrings() {
   return Concat({document, pool, offsets, text, elements});
 }
 
-// The library keeps each converted string. The tool cannot know in advance how much memory a name
-// will take.
+// The platform's library keeps each converted string. The tool cannot know in advance how much
+// memory a name will take.
 TEST(ApkMemory, OverlappingStringsTakeOver100TimesTheDocumentsSize) {
   const Bytes document = DocumentOfOverlappingStrings();
   const long growth = PeakGrowth([&] { return ApkTools::Apk(-1).ParseAndroidManifest(document); });

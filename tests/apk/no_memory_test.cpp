@@ -7,7 +7,8 @@
 
 namespace {
 
-// In the tool's code, only the large integers are allocated with malloc.
+// In the tool's code, only the large integers are allocated with malloc. The first allocation is
+// for the key's modulus.
 TEST(VerifyCertificate, FailedAllocationForTheKeyIsReportedWithCode9) {
   const Bytes archive = MakePackage().Build();
   LogCapture log;
@@ -19,9 +20,9 @@ TEST(VerifyCertificate, FailedAllocationForTheKeyIsReportedWithCode9) {
                                     Error("file not verified: META-INF/CERT.SF\n")}));
 }
 
-// The second allocation is for the key's exponent. The later ones belong to the verification of the
-// certificate, and then to the verification of the data. If one of them fails, the verification
-// that it belongs to fails.
+// The second allocation is for the key's exponent. The next allocations belong to the verification
+// of the certificate, and the last ones to the verification of the data. A failed allocation makes
+// its verification fail.
 TEST(VerifyCertificate, FailedAllocationInTheVerificationIsReported) {
   const Bytes archive = MakePackage().Build();
   int certificates = 0, signatures = 0;
@@ -36,8 +37,9 @@ TEST(VerifyCertificate, FailedAllocationInTheVerificationIsReported) {
     ASSERT_EQ(log.records().size(), 2u) << call;
     const bool certificate = log.records()[0] == Error("RSA could not verify certificate: 11\n");
     const bool data = log.records()[0] == Error("RSA could not verify data: 11\n");
-    // Code 7: the exponent was not allocated, which rsa_set_key does not report. The exponent is
-    // then 0, and nothing verifies, because a number to the power of 0 has no valid padding.
+    // Code 7: the allocation for the exponent failed. rsa_set_key does not report this, and the
+    // exponent is then 0. Nothing verifies, because any number to the power of 0 is 1, and 1 has no
+    // valid padding.
     EXPECT_TRUE(certificate || data ||
                 log.records()[0] == Error("RSA could not verify certificate: 7\n"))
         << call << ": " << log.records()[0];

@@ -119,9 +119,10 @@ TEST(VerifyCertificate, KeyOf2048BytesFailsAtTheCertificate) {
 }
 
 TEST(VerifyCertificate, KeyOfOneByteFailsAtTheCertificate) {
-  // The exponent is empty, so its element is only a header of two bytes. The length of the modulus
-  // INTEGER is the limit for this element. The INTEGER therefore has two bytes, 0 and 1. The
-  // modulus is read without the leading zero, so it has one byte.
+  // The exponent is empty, so its element is only a header of two bytes. The tool accepts this
+  // element only if it is not longer than the contents of the modulus INTEGER (crypto/pkcs7.cpp).
+  // These contents are therefore two bytes, 0 and 1. The modulus is read without the leading zero,
+  // so it has one byte.
   EXPECT_EQ(LogOf(WithBlock(WithPublicKey({0, 1}, {}, 256))),
             Records({Error("RSA could not verify certificate: 5\n"), Error(kNotVerified)}));
 }
@@ -203,12 +204,12 @@ TEST(VerifyCertificate, ShorterSignatureStringAtTheBlocksEndFails) {
             Records({Error("RSA could not verify data: 5\n"), Error(kNotVerified)}));
 }
 
-// Calls VerifyCertificate for a block that signs `covered`, with the digests of `claimed`. `key` is
-// "before" if the call did not change it.
+// The result of a call of VerifyCertificate. `key` is "before" if the call did not change it.
 struct Verification {
   bool verified;
   Bytes key;
 };
+// Calls VerifyCertificate with a block that signs `covered`, and with the digests of `claimed`.
 Verification Verify(SignatureBlock block, const std::string& covered, const std::string& claimed) {
   LogCapture log;
   Apk apk(-1);

@@ -15,7 +15,8 @@ inline Certificate Unsigned() {
   return certificate;
 }
 
-// A parsed certificate. Its bytes end where memory ends, so that reading past them crashes.
+// A parsed certificate. Its bytes end where readable memory ends (GuardedBytes), so that reading
+// past them crashes.
 struct ParsedCertificate {
   explicit ParsedCertificate(const Bytes& der) : bytes(der) {
     result = x509_certificate_parse(bytes.data(), bytes.size(), &cert);

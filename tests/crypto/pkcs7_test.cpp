@@ -286,7 +286,7 @@ TEST(ProcessCertKey, ShortModulusLeavesNoRoomForTheExponent) {
 }
 
 TEST(ProcessCertKey, ExponentElementMayNotBeLongerThanTheModulus) {
-  // The exponent has five bytes: header 02 03, contents 01 00 01.
+  // The exponent's element has five bytes: header 02 03, contents 01 00 01.
   EXPECT_EQ(ProcessedBlock(WithRsaKey(Bytes(5, 0x77), {1, 0, 1})).result, 0);
   const ProcessedBlock processed(WithRsaKey(Bytes(4, 0x77), {1, 0, 1}));
   EXPECT_EQ(processed.result, 1);

@@ -96,7 +96,8 @@ TEST(X509TooLongElement, ElementsOfANameAreMinus12) {
   }
 }
 
-// The bytes that the element would use exist, but they belong to the element around its container.
+// In each case, the parser could read an element only by using bytes after the element's container.
+// These bytes exist, but they belong to the next outer container.
 TEST(X509TooLongElement, ElementsOfANameMayNotUseBytesAfterTheirContainer) {
   const Bytes type = der::Oid(kCommonName);
   const Bytes attribute = der::Sequence({type, Value()});
@@ -144,8 +145,8 @@ TEST(X509TooLongElement, KeyIsMinus14) {
   EXPECT_EQ(ResultOf(certificate), -14);
 }
 
-// In each case, an element or its end follows the SEQUENCE that should contain it. All elements are
-// still in the tbsCertificate.
+// In each case, an element begins or ends after the SEQUENCE that should contain the element. All
+// elements are still in the tbsCertificate.
 TEST(X509TooLongElement, KeyAfterItsInfoIsMinus14) {
   const Bytes algorithm = AlgorithmIdentifier("1.2.3");
   const Bytes key = der::BitString({1, 2, 3});
@@ -161,7 +162,8 @@ TEST(X509TooLongElement, KeyAfterItsInfoIsMinus14) {
   }
 }
 
-// An Extension follows the [3]. A SEQUENCE of extensions that is too long would include it.
+// An Extension follows the element [3], which contains the SEQUENCE of extensions. In the second
+// case, the SEQUENCE has a length that includes this Extension.
 TEST(X509TooLongElement, SequenceOfExtensionsIsMinus15) {
   const Bytes extension = Extension(kUnknown, der::Null());
   const Bytes extensions = der::Sequence({extension});
@@ -183,8 +185,8 @@ TEST(X509TooLongElement, ElementsOfAnExtensionAreMinus15) {
   const Bytes value = der::OctetString(DigitalSignature());
   EXPECT_EQ(ResultOfExtensions({der::Sequence({der::Oid(kKeyUsage), value})}), 0);
   EXPECT_EQ(ResultOfExtensions({der::Sequence({der::Oid(kKeyUsage), RunningOn(value)})}), -15);
-  // The parser reads the header after the critical flag (a BOOLEAN) from the flag's value byte, 04.
-  // It therefore reads the OCTET STRING 04 04 03 02 05 a0.
+  // After the critical flag (a BOOLEAN), the parser expects the next header at the flag's value
+  // byte, 04. It therefore reads the OCTET STRING 04 04 03 02 05 a0 in the first case.
   const Bytes id = Concat({der::Oid(kKeyUsage), der::Boolean(4)});
   const Bytes whole = FromHex("04 03 02 05 a0");
   const Bytes cut = FromHex("04 03 02 05");
@@ -211,7 +213,8 @@ TEST(X509TooLongElement, ElementsOfAValueAreMinus15) {
   const Bytes ca = der::Boolean(0xff);
   const Bytes length = der::Integer(3);
   const auto result_of = [](const std::string& oid, const Bytes& sequence) {
-    // The byte that the element would use is part of the value, after the SEQUENCE.
+    // An element that is one byte too long would use the byte 0. This byte follows the SEQUENCE,
+    // but is still in the extension's value.
     return ResultOfExtensions({Extension(oid, Concat({sequence, {0}}))});
   };
   EXPECT_EQ(result_of(kBasicConstraints, der::Sequence({ca, length})), 0);
@@ -248,13 +251,13 @@ TEST(X509TrailingBytes, LoneByteAfterTheKeyIsMinus5) {
   Certificate certificate = Unsigned();
   certificate.tbs_tail = {0xa4};
   EXPECT_EQ(ResultOf(certificate), -5);
-  // A v1 certificate has no fields to read there.
+  // In a v1 certificate, the parser reads nothing after the key.
   certificate.version = {};
   EXPECT_EQ(ResultOf(certificate), 0);
 }
 
-// Half of a header follows the last element that is read, in containers that the parser does not
-// read to the end.
+// The parser does not read some containers to their end. In each of these containers, the byte 30,
+// which is half of a header, follows the last element that the parser reads.
 TEST(X509TrailingBytes, BytesAfterTheLastElementThatIsReadAreIgnored) {
   const Bytes rest = {0x30};
   const Bytes time = der::Element(der::kUtcTime, "200102030405Z");

@@ -68,11 +68,11 @@ TEST(X509Extensions, FlagOfFalseIsMinus15) {
 
 TEST(X509Extensions, FlagOtherThanFfIsReadAsAnIdentifier) {
   const Bytes value = der::OctetString(DigitalSignature());
-  // The parser reads the flag's byte as an identifier octet. 0x01 is that of a BOOLEAN. Each other
-  // byte below starts a long-form tag: the next octet, 04, is then the tag number, that of an OCTET
-  // STRING. The parser accepts this tag in the private class (0xdf, as for 0xff) and in the
-  // universal class (0x1f). It refuses the tag in the application class (0x5f) and in the
-  // context-specific class (0x9f).
+  // The parser reads the flag's byte as an identifier octet. 0x01 is the identifier octet of a
+  // BOOLEAN. Each other byte below starts a long-form tag. The next octet, 04, is then the tag
+  // number, and 4 is the tag number of an OCTET STRING. The parser accepts this tag in the private
+  // class (0xdf, as for 0xff) and in the universal class (0x1f). It refuses the tag in the
+  // application class (0x5f) and in the context-specific class (0x9f).
   const std::pair<uint8_t, int> cases[] = {
       {0x01, -15}, {0xdf, 0}, {0x5f, -15}, {0x9f, -15}, {0x1f, 0}};
   for (const auto& [flag, result] : cases) {
@@ -216,8 +216,8 @@ TEST(X509BasicConstraints, PathLengthIsReadWithoutCa) {
 TEST(X509BasicConstraints, MalformedValueIsMinus15) {
   // The first three values are no SEQUENCE: empty, of another tag, and of another class. In the
   // next six, the first element is unreadable, neither a BOOLEAN nor an INTEGER, of another class,
-  // or a BOOLEAN of two bytes or of none. In the last four, the second element is unreadable, of
-  // another tag or class, or again a BOOLEAN.
+  // or a BOOLEAN whose value has two bytes or none. In the last four, the second element is
+  // unreadable, of another tag or class, or again a BOOLEAN.
   for (const char* digits :
        {"", "31 00", "b0 00", "30 01 01", "30 02 05 00", "30 03 81 01 ff", "30 03 82 01 01",
         "30 04 01 02 ff ff", "30 02 01 00", "30 04 01 01 ff 02", "30 05 01 01 ff 05 00",

@@ -49,8 +49,8 @@ bool IsIn(const char* name, const void* address) {
 }
 
 // If memory is missing, the platform's String8 crashes on a null pointer, while the platform's
-// other containers abort. This handler turns that crash into an abort, so that a test can tell it
-// from every other crash.
+// other containers abort. This handler turns that crash into an abort, so that a test can
+// distinguish this crash from other crashes.
 void AbortForString8(int, siginfo_t*, void* context) {
 #ifdef __x86_64__
   const auto address = static_cast<ucontext_t*>(context)->uc_mcontext.gregs[REG_RIP];

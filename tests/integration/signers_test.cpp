@@ -197,7 +197,7 @@ TEST(ApktoolkitBound, PassesOnlyTheStandardDescriptorsToTheCommand) {
   EXPECT_EQ(run.output, "0\n1\n2\n3\n");  // 3: the directory that ls reads
 }
 
-// Descriptor 3 is free for the tool, as when the tool is started directly.
+// The command that apktoolkit-bound executes here is the simulator, which runs the tool.
 TEST(ApktoolkitBound, LetsTheToolSignThePackage) {
   const std::string apk = Golden("apksigner-sha256-2048/base.apk");
   const ProcessResult run = RunProcess({APKTOOLKIT_BOUND_PATH, DigestOfKey("apksigner-sha256-2048"),

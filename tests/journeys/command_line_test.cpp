@@ -1,4 +1,5 @@
-// The tool's command line, and the files for which the tool ends without doing anything.
+// Tests the tool's command line, the files that the tool leaves alone, and a run without a
+// simulated phone.
 #include <gtest/gtest.h>
 
 #include <cerrno>

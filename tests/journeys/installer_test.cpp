@@ -298,7 +298,8 @@ TEST(Installer, FileThatChangesBeforeItsAnswerHasNoResult) {
   EXPECT_EQ(told_with("ln '" + apk + "' '" + apk + ".link'").status, 0);
 }
 
-// The run finds no Java. It prints no message about this, because it asks no installer about a JAR.
+// The simulator finds no Java here. It prints no message about this, because it does not ask the
+// installer about a JAR.
 TEST(Installer, IsNotAskedAboutAJar) {
   const TempDir directory;
   const ProcessResult made = RunProcess(

@@ -51,7 +51,8 @@ Bytes KeyBlock(const std::string& path) {
   return block;
 }
 
-// The timeline of a run for a plain JAR, up to the kernel's answer whether it trusts the JAR.
+// The timeline of a run for a plain JAR, up to the event with the kernel's answer, which says
+// whether the kernel trusts the JAR.
 std::string JarUpToVerify(const std::string& path, int refusal = 0) {
   return Timeline({Log(6, "Can't extract Android Manifest: Entry not found\n"),
                    Log(4, "VeltSignJni starts: 3.\n"),

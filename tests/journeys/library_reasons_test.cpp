@@ -66,8 +66,8 @@ TEST_F(Reason, StrictRefusesALibraryThatNoInstallerExtracts) {
   EXPECT_EQ(Told(1, {"--install"}).back(), "-> 0");
 }
 
-// A store delivers a package without libraries beside it. Told always gives --install=no first. The
-// test's own --install option overrides it.
+// A store delivers a package without libraries beside it. The function Told always passes
+// --install=no first. The test's own --install option overrides it.
 TEST_F(Reason, LibrariesMissingBesideThePackageAreReported) {
   Take("apksigner-sha256-2048");
   Do("rm -r lib");

@@ -117,7 +117,7 @@ TEST_F(GoodPackageOn, PhoneThatTrustsNoFileStillSignsThePackage) {
 
 class LibzuAnswer : public GoodPackageOn, public testing::WithParamInterface<int> {
  protected:
-  // The whole timeline, up to the tool's report of the answer.
+  // The part of the timeline before the tool reports libzu's answer.
   std::string UpToTheAnswer(int answer) const {
     return Timeline({LibraryStep({SignedLibrary(library_)}), PackageStep(apk_),
                      Register(3, apk_, "com.example.app", ModulusOf("rsa-2048"), answer)});

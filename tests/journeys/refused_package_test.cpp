@@ -108,7 +108,7 @@ TEST_F(TamperedPackage, ManifestIsRefused) {
 }
 
 TEST_F(TamperedPackage, SignatureFileIsRefused) {
-  package_.Item("META-INF/CERT.SF").data[0] ^= 1;  // of "Signature-Version"
+  package_.Item("META-INF/CERT.SF").data[0] ^= 1;  // the "S" of "Signature-Version"
 
   ExpectRefusalAfter({Log(6, "SHA256 hash does not match"),
                       Log(6, "RSA could not verify data: 12\n"),
@@ -175,8 +175,8 @@ TEST_F(TamperedPackage, CertificateOfAnotherIssuerIsRefused) {
   package_ = MakePackage([] {
     PackageOptions options = Options();
     // The issuer has the smaller modulus, so its signature is a number below the subject's modulus.
-    // The tool therefore refuses the padding and logs 7. For a larger number it would log another
-    // code.
+    // The tool therefore refuses the padding and logs 7. If the number were not below the modulus,
+    // the tool would log 5.
     options.block.key = "rsa-2048-other";
     options.block.issuer_key = "rsa-2048";
     return options;

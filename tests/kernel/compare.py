@@ -32,7 +32,8 @@ OF_SIMULATION = {"journal", "start", "attached", "verdict", "stdout"}
 SEEN_BY_MODULE = {"integrity", "sign", "verify"}
 INFORMATION = 4  # the workstation's liblog drops records of a lower priority
 COMPLAINT = re.compile(r"BUG:|WARNING:|Oops|Call [Tt]race|refcount_t|general protection|avc: +denied")
-# A kernel with an SELinux policy prints this when the installer's domain starts a program of the tool.
+# A kernel with an SELinux policy prints such a line when the installer's domain starts a program of
+# the tool.
 ENTRY = re.compile(r"avc: +granted +{ transition } .* scontext=u:r:installd:s0 tcontext=u:r:apktoolkit:s0 ")
 
 

@@ -1,5 +1,5 @@
-// Tests each reason except kUnknown with a file that gets this reason. Also tests the lines in the
-// log and the release of the archive.
+// Tests each reason except kUnknown with an input that gets this reason. Also tests the lines in
+// the log and the release of the archive.
 #include "library/verification.h"
 
 #include <fcntl.h>
@@ -48,14 +48,14 @@ Reason ReasonWithSignatureFile(const std::string& text) {
   return ReasonOf(options);
 }
 
-// The package without its entry of this name.
+// A good package from which the entry `name` was removed.
 Package Without(const std::string& name) {
   Package package = MakePackage();
   package.Remove(name);
   return package;
 }
 
-// The package with an entry of this name that cannot be extracted.
+// A good package whose entry `name` was changed, so that it cannot be extracted.
 Package WithUnreadable(const std::string& name) {
   Package package = MakePackage();
   ZipItem& item = package.Item(name);

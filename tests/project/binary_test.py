@@ -24,8 +24,8 @@ int main(int count, char** words) {
 """
 
 # The flags of a hardened program, by part of the hardening. A row of BAD replaces the flags of one
-# part. The last part, "heap", is a stack that is not executable, which needs no flag. The entry of
-# "heap" has -O2, which _FORTIFY_SOURCE needs.
+# part. The last part, "heap", means that the stack is not executable. This part needs no flag. Its
+# entry has -O2, which _FORTIFY_SOURCE needs.
 GOOD = {"bind": "-Wl,-z,now", "table": "-Wl,-z,relro", "place": "-pie -fPIE",
         "stack": "-fstack-protector-strong", "calls": "-D_FORTIFY_SOURCE=2", "heap": "-O2"}
 

@@ -1,5 +1,5 @@
 #!/usr/bin/env python3
-"""Runs each command keytool -genkeypair that README.md, docs/guide.md and man/apktoolkit.1 show.
+"""Runs each "keytool -genkeypair" command that README.md, docs/guide.md and man/apktoolkit.1 show.
 The certificate that each command makes must be signed with SHA-256. The pages also name the default
 algorithms of some JDKs. If the installed JDK is one of these JDKs, it must use these algorithms."""
 

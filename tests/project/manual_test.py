@@ -2,7 +2,7 @@
 """Checks the manual pages with mandoc, compares the simulator's page and completion with --help,
 and runs the page's examples.
 
-Arguments: the directory of a good package, and the words that start apktoolkit-sim.
+Arguments: the directory of a good package, and the command line that starts apktoolkit-sim.
 """
 
 import pathlib
@@ -17,7 +17,7 @@ from sources import ROOT, Shell, report
 
 
 def lint(page):
-    """mandoc's complaints, except those that a page of the project is not installed."""
+    """mandoc's complaints. Leaves out the complaint that a page of the project is not installed."""
     output = subprocess.run(["mandoc", "-T", "lint", page], capture_output=True, text=True)
     return [line for line in output.stdout.splitlines()
             if "referenced manual not found: Xr apktoolkit" not in line]

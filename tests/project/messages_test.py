@@ -116,7 +116,7 @@ def reasons_problems(rows, messages):
         is_absent = row["severity"] in ("kAbsent", "kNothing", "kFollows")
         may_hold = row["group"] in UNBROKEN or row["group"] == "kLibrary" or is_absent
         if row["link"] == "kNone" and not may_hold and row["group"] != "kTool":
-            problems.append(f"{name} breaks no link of the chain")
+            problems.append(f"{name}: names no link of the chain (ChainLink)")
         problems += [f"{name}: the tool has no message {text}" for text in re.findall(r"`([^`]+)`", row["log"])
                      if not any(text in message for message in messages)]
     return problems

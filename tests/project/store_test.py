@@ -79,7 +79,7 @@ class Store(Shell):
         return output, problems
 
     def journals(self):
-        """The names of the finished lists. A list's journal gets the list's name when it is whole."""
+        """The names of the finished lists. Only a whole journal has the name of its list."""
         return sorted(path.name for path in (self.directory / "journals").glob("??????"))
 
 
@@ -129,7 +129,8 @@ def cut_journal_problems(shell):
     process = shell.start("./check-batch 000000")
     _, errors = process.communicate()
     if process.returncode == 0 or "000000" in shell.journals():
-        return [f"the job with a cut journal ends with {process.returncode}: {errors}"]
+        return ["a job must fail and keep no journal that was cut off, "
+                f"but it ends with {process.returncode}: {errors}"]
     return []
 
 
@@ -145,7 +146,7 @@ def check(directory, simulator, expected):
         problems += found
     again = [name for name, when in first.items()
              if (directory / "journals" / name).stat().st_mtime_ns != when]
-    if len(again) > 2:  # one job of each worker may have ended before parallel recorded it
+    if len(again) > 2:  # two jobs run at once; both may have ended unrecorded
         problems.append(f"these lists were done, and were run again: {again}")
     counts = [output for command, output in printed.items() if "group_by" in command]
     if [json.loads(text) for text in counts] != [expected]:

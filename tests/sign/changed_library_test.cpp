@@ -66,7 +66,7 @@ class ChangedLibrary : public testing::Test {
     unlink(target_.c_str());
     EXPECT_EQ(symlink(file_.Path(name).c_str(), target_.c_str()), 0);
   }
-  // Overwrites the file in place with as many other bytes.
+  // Overwrites the library in place with other bytes of the same length.
   void WriteInPlace() const {
     UntilNoticed([this] {
       FILE* const file = fopen(target_.c_str(), "r+");
@@ -236,10 +236,11 @@ TEST_F(ChangedLibrary, IsRefusedAtOnceIfExchangedForADirectory) {
   ExpectRefused(1);
 }
 
-// --- The library stays a regular file with the same bytes, or has no first descriptor.
+// --- The descriptor of the library's first opening: kept open, or missing.
 
-// A file system may give a removed file's inode number to the next file. If that file has the same
-// size, and times of the same clock tick, it looks like the file that was read.
+// A file system may give a removed file's inode number to a new file. If the new file has the same
+// size and the same times, it looks like the file that was read. The tool therefore keeps the first
+// descriptor open: the inode number then cannot be used again.
 TEST_F(ChangedLibrary, StaysOpenUntilItIsOpenedAgain) {
   after_digest_[1] = [this] { EXPECT_EQ(DescriptorsOfLibrary(), 1); };
   before_second_open_ = [this] { EXPECT_EQ(DescriptorsOfLibrary(), 1); };
@@ -256,7 +257,7 @@ TEST_F(ChangedLibrary, IsRefusedIfItAppearsAfterItsFirstOpeningFailed) {
   EXPECT_EQ(asked, 2);
 }
 
-// --- Written to in place, which the times show.
+// --- Written to in place. The file's times show the change.
 
 TEST_F(ChangedLibrary, IsRefusedIfWrittenToBeforeItsSecondOpening) {
   before_second_open_ = [this] { WriteInPlace(); };
@@ -292,11 +293,11 @@ TEST_F(ChangedLibrary, IsSignedIfLeasedAtItsSecondOpening) {
     return path == target_ && ++asked == 2 ? EWOULDBLOCK : 0;
   };
   ExpectSigned(1);
-  EXPECT_EQ(asked, 3);  // the third has O_PATH; a fourth, by a path in /proc, is not counted
+  EXPECT_EQ(asked, 3);  // the third open has O_PATH; the fourth, of a path in /proc, is not counted
 }
 
-// Before the tool opens the file again, the holder of the lease could put another file in its
-// place.
+// The holder of the lease could put a FIFO at the library's path before the tool opens this path
+// again.
 TEST_F(ChangedLibrary, FifoThatReplacesALeasedLibraryIsNotWaitedFor) {
   int asked = 0;
   file_.phone.open_error = [&](const char* path, int) {

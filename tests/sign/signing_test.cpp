@@ -180,8 +180,8 @@ TEST(VeltSignJni, LibraryIsOpenedWithoutWaiting) {
   EXPECT_EQ(flags, std::vector<int>({O_RDONLY | O_NONBLOCK | O_CLOEXEC, O_RDONLY | O_NONBLOCK}));
 }
 
-// A file whose name does not end in ".so" is not signed, even if it is among the libraries and the
-// manifest lists it.
+// A file whose name does not end in ".so" is not signed, even if it is in a directory of libraries
+// and the manifest lists it.
 TEST(VeltSignJni, EntryWithAnotherEndingIsNotALibrary) {
   const std::vector<ZipItem> others = {Library("lib/arm64-v8a/libfoo.so.txt"),
                                        Library("lib/arm64-v8a/libfoo.SO"),

@@ -1,6 +1,6 @@
-// Tests the calls to the zip library that the tool's results do not show. The linker redirects the
-// tool's calls to the functions below, which then call the library. CMakeLists.txt has the mangled
-// names.
+// Tests how the tool calls the zip library. The tool's results do not show these calls, so the
+// linker redirects them to the functions below, which then call the library. CMakeLists.txt has the
+// mangled names of the library's functions.
 #include <gtest/gtest.h>
 
 #include <algorithm>

@@ -67,7 +67,8 @@ TEST(Interruption, EndsTheToolAndTheSimulatorByTheSignal) {
   }
 }
 
-// The keyboard signals the tool as well. The tool then ends, but not because of the file.
+// The keyboard signals the simulator's whole process group. The tool is in a group of its own, and
+// the simulator ends it. This end is not a refusal of the file.
 TEST(Interruption, SignalToTheProcessGroupIsNotARefusal) {
   const Probe slow({"sign 3 0000", "pid", "sleep 60"});
   const std::string sarif = slow.directory() / "log.sarif";

@@ -28,8 +28,9 @@ std::string Exit(int status);
 
 std::string Timeline(std::initializer_list<std::string> parts);
 
-// The payload for a package that is signed with the RSA test key, made without the tool's code: the
-// length 32 as two bytes, low byte first, and the SHA-256 digest of the modulus.
+// The payload for a package that is signed with the RSA test key `key`: the length 32 as two bytes,
+// low byte first, and the SHA-256 digest of the modulus. The payload is computed without the tool's
+// code.
 Bytes PackagePayload(const std::string& key = "rsa-2048");
 
 // The parts that many tests share.
@@ -41,5 +42,5 @@ std::string LibraryStep(std::initializer_list<std::string> libraries = {});
 std::string SignedLibrary(const std::string& path, const Bytes& payload = PackagePayload());
 // The events of VeltSign, the step that signs the package file, for a good package.
 std::string PackageStep(const std::string& path, const Bytes& payload = PackagePayload());
-// The events of both steps for a package that is not good.
+// The events of both steps for a package that the tool refused before the first step.
 std::string NothingSigned(const std::string& path);

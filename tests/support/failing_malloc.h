@@ -1,14 +1,14 @@
 // Makes one chosen allocation fail, and counts the blocks that are freed before they are wiped.
 //
-// A test program linked with -Wl,--wrap=malloc,--wrap=free sends the calls of its own object files
-// here, and this file calls the real functions. The platform's libraries and the sanitizers call
-// the real functions directly.
+// The test program must be linked with -Wl,--wrap=malloc,--wrap=free. Its own object files then
+// call the functions of failing_malloc.cpp, which call the real malloc and free. The platform's
+// libraries and the sanitizers call the real functions directly.
 #pragma once
 
 #include <cstddef>
 
-// While it lives, makes one call of malloc fail and watches the blocks of the other calls. Only one
-// FailingMalloc may live at a time.
+// While an object of this class exists, one call of malloc fails, and the blocks of the other calls
+// are watched. Only one FailingMalloc may exist at a time.
 class FailingMalloc {
  public:
   // Makes call number `failing_call` fail, counted from 1; 0 lets all succeed.

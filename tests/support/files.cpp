@@ -76,7 +76,7 @@ std::string ContentOf(const std::string& path) {
   return {std::istreambuf_iterator<char>(file), {}};
 }
 
-// The system call itself: before API level 30 the C library has no function for it.
+// Makes the system call directly, because the C library has memfd_create only from API level 30 on.
 MemoryFile::MemoryFile(const Bytes& content, const std::string& name)
     : fd_(static_cast<int>(syscall(SYS_memfd_create, name.c_str(), MFD_CLOEXEC))),
       path_("/memfd:" + name + " (deleted)") {
@@ -89,8 +89,8 @@ MemoryFile::MemoryFile(const Bytes& content, const std::string& name)
 
 MemoryFile::~MemoryFile() { close(fd_); }
 
-// Keeps the file under the number 100 + fd. dup() would choose the lowest free number, which
-// another FreeDescriptor may have to keep free.
+// Keeps the file of descriptor `fd` open under the number 100 + fd. dup() would choose the lowest
+// free number, which another FreeDescriptor may have to keep free.
 FreeDescriptor::FreeDescriptor(int fd) : fd_(fd), kept_(dup2(fd, 100 + fd)) { close(fd); }
 
 FreeDescriptor::~FreeDescriptor() {

@@ -1,5 +1,6 @@
-// Directories and files for one test, on disk and in memory. Each object removes its directory or
-// file when it is destroyed. If a directory or file cannot be made, the program aborts.
+// Directories and files for one test, on disk and in memory. Each TempDir, DiskFile and MemoryFile
+// removes its directory or file when it is destroyed. If a directory or file cannot be made, the
+// program aborts.
 #pragma once
 
 #include <string>
@@ -46,7 +47,7 @@ class DiskFile {
   std::string path_;
 };
 
-// A file without a name on disk.
+// A file in memory, which has no name on disk.
 class MemoryFile {
  public:
   explicit MemoryFile(const Bytes& content, const std::string& name = "test");
@@ -63,7 +64,8 @@ class MemoryFile {
   std::string path_;
 };
 
-// While this object exists, no file is open under the number `fd`.
+// Closes `fd`, so that tested code can get this number for its own file. The destructor makes `fd`
+// refer to its former file again.
 class FreeDescriptor {
  public:
   explicit FreeDescriptor(int fd);

@@ -11,9 +11,9 @@
 
 namespace {
 
-// On a phone, TEST_KEYS_DIR is relative to the program's directory. If the programs of each
-// processor have their own directory, TEST_KEYS_DIR is relative to the directory above it. (This
-// function does not call readlink, because the linker wraps readlink in some tests.)
+// On a phone, TEST_KEYS_DIR is relative to the program's directory. If the programs for each
+// processor have a separate directory, TEST_KEYS_DIR is relative to the parent of that directory.
+// (This function does not call readlink, because the linker wraps readlink in some tests.)
 std::string KeysDirectory() {
   const std::string keys = TEST_KEYS_DIR;
   if (keys[0] == '/') return keys;

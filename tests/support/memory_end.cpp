@@ -13,10 +13,10 @@ namespace {
 
 constexpr size_t kRoom = 1 << 20;
 
-// The end of the readable memory. The block that operator new puts there is in the kRoom bytes
-// before this address.
+// The end of the kRoom bytes that MakeMemory maps. The page after them cannot be accessed. The
+// block that PutNextBlockAtMemoryEnd requests is in these kRoom bytes, at their end.
 uint8_t* memory_end = nullptr;
-// The size of the block that operator new must put there next; 0: no block.
+// operator new puts the next block of this size at memory_end; 0: no block.
 size_t size_at_end = 0;
 
 void MakeMemory() {

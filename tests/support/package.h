@@ -23,8 +23,8 @@ inline constexpr char kAndroidManifestName[] = "AndroidManifest.xml";
 struct PackageOptions {
   std::string package_name = "com.example.app";
   bool secure_storage = false;
-  // Replaces the compiled manifest that is made from the two fields above. Empty bytes leave the
-  // entry out (a JAR).
+  // Replaces the compiled manifest that is made from the two fields above. If set to no bytes, the
+  // archive has no such entry (a JAR).
   std::optional<Bytes> android_manifest;
   // The entries other than the Android manifest, in the order of the archive.
   std::vector<ZipItem> entries = {{"classes.dex", ToBytes("dex\n035")},
@@ -49,7 +49,7 @@ class Package {
  public:
   std::vector<ZipItem> items;
 
-  // The first entry of this name. Aborts if none has it.
+  // The first entry of this name. Aborts if there is no such entry.
   ZipItem& Item(const std::string& name);
   void Remove(const std::string& name);
   // Flips one bit in the middle of the entry's data, after signing.

@@ -32,11 +32,12 @@ struct Phone {
   int zu_result = 0;              // the answer of libzu
   int zu_attribute_size = -1;     // of "user.zu", on every file; -1: the real attribute
   std::vector<int> nameless_fds;  // descriptors whose path cannot be resolved
-  // The result of fcntl to sign (if sign_errno is 0) and to verify (if verify_errno is 0).
+  // The result of the fcntl call that signs (if sign_errno is 0), and of the one that verifies (if
+  // verify_errno is 0).
   int kernel_result = 0;
 
-  // Called before the integrity file is opened. The tool opens it after its checks of a file, and
-  // before the kernel signs the file.
+  // Called before the integrity file is opened. The tool opens the integrity file after it has
+  // checked a file, and before it asks the kernel to sign this file.
   std::function<void()> before_integrity;
   // Called before each open(), and after each successful one.
   std::function<void(const char* path, int flags)> before_open;

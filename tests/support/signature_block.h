@@ -15,7 +15,7 @@ struct SignatureBlock {
   // The signer's key, and the digest that it signs.
   std::string key = "rsa-2048";
   Digest digest = Digest::kSha256;
-  // The key that issued the signer's certificate; empty: the signer's own key.
+  // The key that signs the signer's certificate; empty: the signer's own key.
   std::string issuer_key;
   // The serial number that names the signer; unset: the serial number of the signer's certificate.
   std::optional<Bytes> serial;

@@ -9,10 +9,11 @@ struct Simulation {
   std::string timeline;  // see expected_timeline.h
 };
 
-// Runs the tool on `file` in the simulated phone that `options` describe. Here and below, no
-// phone's installer is asked, and no library is extracted for the tool (--install), unless an
-// option says so. Most tests check the tool's own answers about files in the places where the test
-// put them. The test fails if the simulation itself fails or writes anything to standard error.
+// Runs the tool on `file` in the simulated phone that `options` describe. Simulate and FirstLines
+// pass --installer=off and --install=no to the simulator. The options of the test come later and
+// can override these two options. Most tests check the tool's own answers about files in the places
+// where the test put them. The test fails if the simulation itself fails or writes anything to
+// standard error.
 Simulation Simulate(const std::string& file, const std::vector<std::string>& options = {});
 
 // The same, with words before the simulator's command and with a working directory.
@@ -28,8 +29,8 @@ Simulation Simulate(const std::string& file, const std::vector<std::string>& opt
 std::vector<std::string> FirstLines(size_t count, const std::vector<std::string>& words,
                                     const Start& start);
 
-// True if the built programs are for another processor and run under an emulator, which answers
-// some questions in place of the kernel.
+// True if the built programs are for another processor and run under an emulator, which handles
+// some system calls in place of the kernel.
 bool AreProgramsEmulated();
 
 // The paths of the built programs.

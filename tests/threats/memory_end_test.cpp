@@ -1,5 +1,6 @@
-// Tests documents, manifests and their tables in a block at the end of the readable memory. If the
-// platform's parser or the tool's code reads beyond the block, the test crashes.
+// Puts compiled Android manifests, JAR manifests and their tables in a block at the end of the
+// readable memory. If the platform's parser or the tool's code reads beyond the block, the test
+// crashes.
 #include <gtest/gtest.h>
 
 #include "apk/apk.h"

@@ -19,7 +19,8 @@ std::string Made(const std::string& name) {
   return std::filesystem::canonical(THREAT_PACKAGES).string() + "/" + name + "/base.apk";
 }
 
-// The events of a run that signs both libraries and the package for the key, and registers the key.
+// The events of a run that signs both libraries and the package with the payload of the signer's
+// key `key`, and registers this key under `name`.
 std::string AllSignedAndRegistered(const std::string& apk, const std::string& key,
                                    const std::string& name) {
   const std::string directory = std::filesystem::path(apk).parent_path();

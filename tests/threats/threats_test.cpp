@@ -1,5 +1,6 @@
-// Tests the effects of hostile files under rules that are lenient or trusting on purpose, and the
-// limits of these effects. docs/threat-model.md explains the reasons.
+// Some rules of the tool are lenient on purpose, or trust the file. Tests what hostile files can
+// achieve because of these rules, and what they cannot achieve. docs/threat-model.md explains the
+// reasons.
 #include <sys/mman.h>
 #include <sys/wait.h>
 
@@ -89,7 +90,7 @@ TEST(Threat, ModulusWithExtraBytesIsTheKeyThatItStartsWith) {
   EXPECT_EQ(Device(package).FilesSignedFor("rsa-2048"), Strings({"app/base.apk"}));
 }
 
-// No verified fact shows that a newer package exists.
+// The tool does not check whether a newer version of the package exists.
 TEST(Threat, OlderPackageOfASignerKeepsItsPayload) {
   const Package older = MakePackage();
   PackageOptions options;
@@ -298,7 +299,8 @@ TEST(Threat, PackageWrittenToInPlaceAfterItsChecksIsSigned) {
   EXPECT_EQ(BytesSigned(device)[package], expected);
 }
 
-// The write comes after the kernel answers that it trusts the file, and before it signs the file.
+// The write comes after the kernel answers that it trusts the file, and before the kernel signs the
+// file.
 TEST(Threat, JarWrittenToInPlaceAfterItWasTrustedIsSigned) {
   const Bytes archive = MakePackage(PlainJar()).Build();
   Device device(archive);

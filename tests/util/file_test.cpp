@@ -382,7 +382,7 @@ TEST(IsSameFile, EachPartOfTheStateCounts) {
   }
 }
 
-// Both states are equal, but they are not of a regular file.
+// Both states are equal, but neither is the state of a regular file.
 TEST(IsSameFile, FilesThatAreNotRegularAreNotTheSame) {
   struct stat state = {};
   EXPECT_FALSE(IsSameFile(state, state));

@@ -146,8 +146,8 @@ void Judge(const Key& key, const std::string& sha, const json& test, Counts* cou
       << "test " << test.at("tcId") << ": " << test.value("comment", "");
 }
 
-// Judges the vectors of a file, and returns how many had each outcome. Leaves out keys whose
-// exponent does not fit in the tool's 4 bytes.
+// Judges the vectors of a file, and returns how many had each outcome. Leaves out the vectors of
+// keys whose exponent does not fit in the tool's 4 bytes.
 Counts JudgeFile(const std::string& path) {
   SCOPED_TRACE(path);
   std::ifstream file(path);

@@ -1,5 +1,5 @@
 // Tests how the simulator runs the Java program that judges packages as a phone's installer does.
-// The tests put programs of their own in the place of java.
+// Most tests replace java by a script of their own.
 #include "simulator/installer/installer.h"
 
 #include <gtest/gtest.h>

@@ -195,8 +195,8 @@ TEST(ArchiveEnd, IsTheLastMarkThatHasRoomForARecord) {
   EXPECT_EQ(end_of(std::string("PK\5\6") + std::string(18, '\0')), 0);
 }
 
-// The names in the central directory of an archive with "a" and "bcd", after `change`. `change`
-// gets the bytes of the archive and the offset of the directory.
+// Builds an archive with the entries "a" and "bcd", and calls `change` with its bytes and the
+// offset of its central directory. Returns the names in the changed directory.
 Lines NamesAfter(const std::function<void(Bytes* zip, ptrdiff_t directory)>& change) {
   Bytes zip = BuildZip({Good("a"), Good("bcd")});
   const auto end = FindArchiveEnd(MemoryFile(zip).fd());

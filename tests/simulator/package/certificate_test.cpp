@@ -186,8 +186,8 @@ TEST(CertificateFacts, BytesAfterTheCertificateAreIgnored) {
   EXPECT_EQ(ParseCertificate(View(der))->sha256, digest);
 }
 
-// The expected texts are the owners that keytool prints. keytool writes names with a class of the
-// JDK.
+// The expected texts are the owners that keytool prints. keytool uses a class of the JDK to write
+// names, so its texts are those of the JDK.
 TEST(CertificateName, IsWhatTheJdkWrites) {
   const std::vector<Bytes> names = {
       Name({{"2.5.4.6", "AB"},

@@ -235,7 +235,7 @@ TEST(PackageFacts, LibrariesAfterADamagedOneAreNotReached) {
   }
   const PackageFacts facts = FactsOf(package.Build());
   EXPECT_EQ(facts.libraries.size(), 65U);
-  EXPECT_LT(count_met(facts), 45) << "those that can be extracted";
+  EXPECT_LT(count_met(facts), 45) << "damaged libraries must not count";
 }
 
 TEST(PackageFacts, ListThePartsThatAreTooLong) {

@@ -46,8 +46,8 @@ TEST(KeyReadByTool, IsThatOfTheCertificate) {
   EXPECT_FALSE(jar.names_other_certificate);
 }
 
-// The last four bytes of an eight-byte exponent overwrite the tool's modulus length. Here they are
-// 100 in the byte order of the host.
+// The last four bytes of an eight-byte exponent overwrite the tool's modulus length. In this test,
+// these four bytes are 100 in the byte order of the host.
 TEST(KeyReadByTool, MayBeAPartOfTheModulus) {
   const JarSignatureFacts jar =
       SignatureOf(WithKey(Concat({{0}, Modulus()}), {1, 0, 1, 0, 100, 0, 0, 0}));

@@ -11,7 +11,7 @@ namespace {
 
 std::string Refusal(int error) { return "-1 " + std::to_string(error); }
 
-const std::string kSuccess = "0 77";  // errno is unchanged
+const std::string kSuccess = "0 77";  // result 0; errno is still 77, which the probe set
 
 Json SignEvent(int fd, const std::string& path, const std::string& payload, int error) {
   return {{"event", "sign"},          {"fd", fd},      {"path", path}, {"payload", payload},

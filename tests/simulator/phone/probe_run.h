@@ -14,7 +14,7 @@ using Json = nlohmann::json;
 struct ProbeRun {
   int status = 0;            // of apktoolkit-sim
   std::string errors;        // the standard error of apktoolkit-sim and of the probe
-  Lines results;             // "RESULT ERRNO" for each command, which starts with errno 77
+  Lines results;             // "RESULT ERRNO" for each command; errno is 77 before it
   std::vector<Json> events;  // the journal, from the event after "attached" to "exit"
 };
 

@@ -34,7 +34,8 @@ TEST(JournalText, Utf8StaysAsItIs) {
   }
 }
 
-// The text of a journal on a terminal must not mislead a person. A JSON reader gets the same text.
+// The text of a journal on a terminal must not mislead a person. A JSON reader turns each escape
+// back into its character.
 TEST(JournalText, HiddenCharactersAreEscaped) {
   EXPECT_EQ(EncodeText("\u0080\u009f\u00ad\u061c\u180e"), R"("\u0080\u009f\u00ad\u061c\u180e")");
   EXPECT_EQ(EncodeText("\u200b\u200f\u2028\u202e\u2060\u206f"),

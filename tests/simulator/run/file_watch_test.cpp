@@ -35,7 +35,7 @@ void SetBytes(const std::string& file, const char* bytes) {
   close(fd);
 }
 
-// Writes `bytes` and restores the mtime, so that of the file's state only the ctime differs. A
+// Writes `bytes` and restores the mtime. In the file's state, only the ctime then differs. A
 // program can hide a change of the bytes in this way. But a new ctime alone does not prove such a
 // change: chmod also sets the ctime.
 void ChangeTheInodeAlone(const std::string& file, const char* bytes) {

@@ -1,5 +1,5 @@
-// Tests to which file TakeApart assigns an answer of the kernel. This depends on the step that the
-// tool is in, and on the path.
+// Tests that TakeApart assigns each answer of the kernel to the right file. The step that the tool
+// is in and the path decide which file this is.
 #include "simulator/run/run_record.h"
 
 #include <gtest/gtest.h>

@@ -199,8 +199,8 @@ TEST(VerdictEvent, EveryStateOfALinkHasACode) {
   EXPECT_EQ(chain[2]["state"], "not-reached");
 }
 
-// The event reports the key that the kernel got as the key of scheme v1, even if no certificate has
-// this key.
+// The event lists a signer of scheme v1 with the digest of the package's key, even if no
+// certificate was read.
 TEST(VerdictEvent, KeyWithoutACertificateIsReportedAsV1Signer) {
   Report report;
   report.key = {"ab", 2048, true};

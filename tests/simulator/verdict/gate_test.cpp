@@ -1,5 +1,5 @@
 // Tests the gate: the demands of --signer and --werror on each file, and the demand that files with
-// one package name have one signer.
+// the same package name have the same signer.
 #include "simulator/verdict/gate.h"
 
 #include <gtest/gtest.h>

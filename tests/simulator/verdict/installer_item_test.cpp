@@ -85,7 +85,7 @@ TEST(InstallerItem, NamesTheEntry) {
             start + "a/b was added after signing: the manifest does not list it");
   EXPECT_EQ(Why({"JAR_SIG_DUPLICATE_ZIP_ENTRY", {"a/b"}, ""}),
             start + "a/b is in it more than once");
-  // If the verifier's answer lacks the parameter, the item shows the text of the answer.
+  // Without the entry's name, the item shows the verifier's own text and the name of the issue.
   EXPECT_EQ(Why({"JAR_SIG_DUPLICATE_ZIP_ENTRY", {}, "twice"}),
             start + "twice (JAR_SIG_DUPLICATE_ZIP_ENTRY)");
 }
@@ -113,7 +113,7 @@ TEST(OtherSigner, IsOneOfTheNewestScheme) {
   EXPECT_TRUE(is_other({{"v2", "other"}, {"v2", "own"}}));
 }
 
-// The newest phones that install the package count.
+// OtherSigner looks only at the newest phones that install the package.
 TEST(OtherSigner, IsTheSignerForTheNewestPhonesThatInstall) {
   Report report;
   report.signer = WithKey("own");

@@ -80,7 +80,8 @@ TEST(Protection, OnlyComparedEntriesAreVerified) {
   EXPECT_EQ(verified(false, true), 10U);
 }
 
-// The tool checked the library beside the package. The library inside the package differs from it.
+// The tool verified the library on disk, beside the package. The copy of this library inside the
+// package differs from the manifest, and so does the resource.
 TEST(Protection, EntryThatDiffersFromTheManifestIsNotVerified) {
   PackageFacts facts = Package();
   facts.entries[1].digest = EntryDigest::kDiffers;

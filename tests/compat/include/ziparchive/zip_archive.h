@@ -17,7 +17,7 @@ struct ZipString {
   const uint8_t* name;
   uint16_t name_length;
 
-  ZipString() {}  // leaves both fields as they are, as on the phone
+  ZipString() {}  // leaves both fields uninitialized, as on the phone
   // Ends the program if `entry_name` is longer than 65,535 bytes.
   explicit ZipString(const char* entry_name);
 
