@@ -33,7 +33,7 @@ struct InstallerSigner {
   CertificateFacts certificate;
 };
 
-// The judgement of the phones in one range of API levels.
+// apksig's judgement of the package, for the phones in one range of API levels.
 struct RangeJudgement {
   LevelRange levels = {0, 0};
   bool is_verified = false;

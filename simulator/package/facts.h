@@ -39,7 +39,9 @@ struct LibraryFacts {
   // The path at which the tool looks for the file, relative to the package's directory; empty:
   // `entry` does not begin with the directory of an Arm ABI.
   std::string place;
-  bool is_met = true;          // the tool reaches `entry`; a damaged entry stops the tool
+  // True if the tool reaches `entry`. False for a damaged entry, and for each entry after the first
+  // damaged one.
+  bool is_met = true;
   int error = 0;               // errno of opening the file; 0: it can be opened, or no `place`
   bool has_directory = false;  // the file's directory exists
 };
@@ -51,7 +53,8 @@ struct PackageFacts {
   bool was_changed = false;   // the file became shorter while it was read
   uint64_t size = 0;          // of the file, in bytes
   std::string sha256;         // of the file's bytes; empty: it was not read to its end
-  uint64_t packages = 0;      // for a directory: the number of files in it with package names
+  // For a directory: the number of files in it whose names end like a package's, such as .apk.
+  uint64_t packages = 0;
   // The result of the zip library. If it is 0, the library opened the archive, and the members
   // after `entry_twice` are filled.
   int32_t archive_result = -1;
@@ -62,7 +65,9 @@ struct PackageFacts {
   JarSignatureFacts jar;
   std::vector<NewerSignerFacts> newer;
   bool has_damaged_signing_block = false;
-  std::vector<std::string> too_long;  // parts not read: too long, or with overlapping strings
+  // Parts that were not read because they are too long, or an Android manifest whose strings
+  // overlap.
+  std::vector<std::string> too_long;
   std::vector<ListedEntry> entries;
   std::vector<std::string> missing;  // names in MANIFEST.MF that the archive does not have
   // In the order in which the tool reads their entries, damaged ones last.
@@ -71,7 +76,7 @@ struct PackageFacts {
 
 // Looks at the file at `path`, and at the libraries beside it. Reads no pipes and no devices, and
 // never waits. After `is_late` returns true, reads no more bytes for `sha256`, and compares no more
-// entries with the manifest.
+// entries with their digests in MANIFEST.MF.
 PackageFacts LookAt(const std::string& path, const IsLate& is_late = IsNeverLate);
 
 // The SHA-256 digest of the bytes of an open file, in lower-case hexadecimal; empty if they cannot

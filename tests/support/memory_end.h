@@ -1,5 +1,5 @@
-// Memory that ends where a block ends, for code that no sanitizer checks. A read after the end of
-// the memory crashes the program.
+// Puts a block at the end of accessible memory, for code that no sanitizer checks. A read after the
+// end of the memory crashes the program.
 //
 // A program that links this file (target `memory_end`) has its operator new replaced.
 #pragma once

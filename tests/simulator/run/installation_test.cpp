@@ -211,9 +211,10 @@ TEST(Installation, SaysWhenItCannotWrite) {
   EXPECT_EQ(problem_with(3000), "");
 }
 
-// A write lease (F_SETLEASE) delays every other open() of the file, unless open() has the flag
-// O_NONBLOCK. The installation uses this flag, and leaves the package where it is. The tool waits,
-// and the simulator's report then names the lease.
+// A write lease (F_SETLEASE) delays every other open() of the file. With the flag O_NONBLOCK,
+// open() fails at once instead. The installation uses this flag. If its open() fails, it leaves the
+// package where it is. In a whole run, the tool then waits for the end of the lease, and the report
+// names the lease.
 TEST(Installation, DoesNotWaitForALease) {
   const TempDir directory;
   const std::string file = directory / "base.apk";
