@@ -17,7 +17,7 @@ constexpr char kNotTrusted[] =
 
 }  // namespace
 
-TEST(SimulatorOutput, AreSeparatedByAnEmptyLineAndSummedUp) {
+TEST(SimulatorOutput, SeparatesFilesByAnEmptyLineAndSumsThemUp) {
   const Probe good({"sign 3 0000"});
   const Probe bad({"verify 3"});
   const ProcessResult result = Simulated({good.path(), bad.path(), good.path()});
@@ -27,7 +27,7 @@ TEST(SimulatorOutput, AreSeparatedByAnEmptyLineAndSummedUp) {
   EXPECT_EQ(LinesOf(result.output).back(), "3 files: 2 trusted JARs, 1 JAR not trusted");
 }
 
-TEST(SimulatorOutput, ShowOnlyTheVerdictLinesWithQuiet) {
+TEST(SimulatorOutput, HasOnlyTheVerdictLinesWithQuiet) {
   const Probe good({"sign 3 0000"});
   const Probe bad({"verify 3"});
   EXPECT_EQ(
@@ -36,7 +36,7 @@ TEST(SimulatorOutput, ShowOnlyTheVerdictLinesWithQuiet) {
 }
 
 // The first file takes longest, but the output keeps the order of the command line.
-TEST(SimulatorOutput, KeepTheirOrderWhenSeveralRunAtATime) {
+TEST(SimulatorOutput, KeepsTheOrderOfFilesThatRunAtTheSameTime) {
   const Probe slow({"sign 3 0000", "sleep 1"});
   const Probe quick({"verify 3"});
   const Lines files = {slow.path(), quick.path(), quick.path(), quick.path()};
@@ -62,13 +62,13 @@ TEST(SimulatorOutput, KeepTheirOrderWhenSeveralRunAtATime) {
 
 // The simulator overwrites a progress line later. It cannot do so in a pipe, so a pipe gets no
 // progress lines.
-TEST(SimulatorOutput, ShowNoProgressWithoutATerminal) {
+TEST(SimulatorOutput, ShowsNoProgressWithoutATerminal) {
   const Probe slow({"sign 3 0000", "sleep 2"});
   EXPECT_EQ(Simulated({slow.path()}).errors, "");
 }
 
 // The program "script" of util-linux gives the simulator a terminal.
-TEST(SimulatorOutput, ShowProgressOnATerminalWhenItTakesLonger) {
+TEST(SimulatorOutput, ShowsProgressOnATerminalIfAFileTakesLonger) {
   if (RunProcess({"script", "-qec", "true", "/dev/null"}).status != 0) {
     GTEST_SKIP() << "there are no pseudo-terminals here: /dev/pts is not mounted";
   }
@@ -84,7 +84,7 @@ TEST(SimulatorOutput, ShowProgressOnATerminalWhenItTakesLonger) {
 }
 
 // https://no-color.org: the variable counts if it is present and not empty.
-TEST(SimulatorOutput, VariableNoColorTurnsColoursOff) {
+TEST(SimulatorOutput, HasNoColoursIfNoColorIsSet) {
   if (RunProcess({"script", "-qec", "true", "/dev/null"}).status != 0) {
     GTEST_SKIP() << "there are no pseudo-terminals here: /dev/pts is not mounted";
   }
