@@ -14,8 +14,8 @@ namespace {
 // Makes the file at `path` the standard stream `number`.
 bool Redirect(int number, const std::string& path, int flags) {
   const int fd = open(path.c_str(), flags, 0600);
-  if (fd < 0 || fd == number) return fd == number;  // the number is free if the stream was closed
-  return dup2(fd, number) == number && close(fd) == 0;
+  if (fd == number) return true;  // the stream was closed, so its number was free
+  return fd >= 0 && dup2(fd, number) == number && close(fd) == 0;
 }
 
 // In the child process: executes the command, or exits with 127 as a shell does.
