@@ -11,6 +11,7 @@ using Json = nlohmann::json;
 
 Judgement NoAnswer(const std::string& why);
 bool ReadRange(const Json& json, RangeJudgement* range);
+bool IsNext(const LevelRange& levels, const std::vector<RangeJudgement>& before);
 bool ReadIssues(const Json& json, const char* key, std::vector<InstallerIssue>* issues);
 bool ReadTexts(const Json& json, const char* key, std::vector<std::string>* texts);
 bool ReadSigners(const Json& json, std::vector<InstallerSigner>* signers);
@@ -31,7 +32,9 @@ Judgement ParseJudgement(const std::string& line) {
   judgement.state = Judgement::State::kJudged;
   for (const Json& each : *ranges) {
     RangeJudgement range;
-    if (!ReadRange(each, &range)) return NoAnswer("its answer is malformed");
+    if (!ReadRange(each, &range) || !IsNext(range.levels, judgement.ranges)) {
+      return NoAnswer("its answer is malformed");
+    }
     for (const InstallerSigner& signer : range.signers) {
       if (!signer.certificate.sha256.empty()) continue;
       return NoAnswer("the crypto library does not read the certificate of the " + signer.scheme +
@@ -60,6 +63,13 @@ bool ReadRange(const Json& json, RangeJudgement* range) {
          ReadIssues(json, "warnings", &range->warnings) &&
          range->is_verified == range->errors.empty() &&
          (!range->is_verified || !range->signers.empty());
+}
+
+// The ranges must not overlap or leave a gap. The report would otherwise name phones of an API
+// level twice, or not at all.
+bool IsNext(const LevelRange& levels, const std::vector<RangeJudgement>& before) {
+  return levels.first > 0 && levels.first <= levels.last &&
+         (before.empty() || before.back().levels.last == levels.first - 1);
 }
 
 bool ReadIssues(const Json& json, const char* key, std::vector<InstallerIssue>* issues) {
@@ -95,10 +105,11 @@ bool ReadSigners(const Json& json, std::vector<InstallerSigner>* signers) {
   return true;
 }
 
+// An odd number of digits is malformed: the null character after the text completes the last pair.
 std::optional<std::string> FromHex(const std::string& digits) {
   constexpr char kDigits[] = "0123456789abcdef";
   std::string bytes;
-  for (size_t i = 0; i + 1 < digits.size(); i += 2) {
+  for (size_t i = 0; i < digits.size(); i += 2) {
     const size_t high = std::string_view(kDigits).find(digits[i]);
     const size_t low = std::string_view(kDigits).find(digits[i + 1]);
     if (high == std::string::npos || low == std::string::npos) return {};

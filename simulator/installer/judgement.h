@@ -53,7 +53,7 @@ struct Judgement {
 
   State state = State::kNotAsked;
   std::string why;                     // the reason, for kMissing and kGaveUp
-  std::vector<RangeJudgement> ranges;  // sorted by level; neighbours have different judgements
+  std::vector<RangeJudgement> ranges;  // sorted by level; each begins just after the one before it
 };
 
 // Parses one line of the verifier's output. The result's state is kJudged or kGaveUp.

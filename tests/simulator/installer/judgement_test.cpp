@@ -22,6 +22,15 @@ const std::string kSigner =
     R"([{"scheme":"v2","certificate":")" + Hexadecimal(Certificate().Build()) + R"("}])";
 constexpr char kError[] = R"([{"issue":"A_FAULT","parameters":["a","b"],"text":"a b"}])";
 
+// An answer with two ranges. Each parameter is the first and the last level of a range.
+std::string AnswerFor(const std::string& first, const std::string& second) {
+  const auto range = [](const std::string& levels) {
+    return "{" + levels + R"(,"verified":false,"schemes":[],"signers":[],"errors":)" + kError +
+           R"(,"warnings":[]})";
+  };
+  return R"({"ranges":[)" + range(first) + "," + range(second) + "]}";
+}
+
 std::string WhyNone(const std::string& answer) {
   const Judgement judgement = ParseJudgement(answer);
   EXPECT_EQ(judgement.state, Judgement::State::kGaveUp) << answer;
@@ -68,6 +77,7 @@ TEST(Judgement, MalformedAnswerIsNoAnswer) {
         std::string(R"({"ranges":[1]})"), std::string(R"({"ranges":[{"first":27}]})"),
         Answer("1", kSigner, "[]"), Answer("true", "1", "[]"), Answer("true", "[1]", "[]"),
         Answer("true", R"([{"scheme":"v2","certificate":"zz"}])", "[]"),
+        Answer("true", R"([{"scheme":"v2","certificate":"300"}])", "[]"),
         Answer("true", R"([{"scheme":"v2","certificate":""}])", "[]"), Answer("false", "[]", "1"),
         Answer("false", "[]", "[1]"),
         Answer("false", "[]", R"([{"issue":"A","parameters":[1],"text":""}])")}) {
@@ -87,4 +97,26 @@ TEST(Judgement, AnswerThatContradictsItselfIsNoAnswer) {
   EXPECT_EQ(WhyNone(Answer("true", kSigner, kError)), "its answer is malformed");
   EXPECT_EQ(WhyNone(Answer("true", "[]", "[]")), "its answer is malformed");
   EXPECT_EQ(WhyNone(Answer("false", "[]", "[]")), "its answer is malformed");
+}
+
+TEST(Judgement, RangesHaveTheOrderOfTheAnswer) {
+  const Judgement judgement =
+      ParseJudgement(AnswerFor(R"("first":27,"last":32)", R"("first":33,"last":2147483647)"));
+  ASSERT_EQ(judgement.ranges.size(), 2U);
+  EXPECT_EQ(judgement.ranges[0].levels.first, 27);
+  EXPECT_EQ(judgement.ranges[0].levels.last, 32);
+  EXPECT_EQ(judgement.ranges[1].levels.first, 33);
+  EXPECT_EQ(judgement.ranges[1].levels.last, kNewestLevel);
+}
+
+// Without this check, the report could name phones of an API level twice, or not at all.
+TEST(Judgement, AnswerWithOverlapOrGapIsNoAnswer) {
+  const std::string low = R"("first":27,"last":32)", high = R"("first":33,"last":40)";
+  for (const std::string& answer :
+       {AnswerFor(high, low), AnswerFor(low, low), AnswerFor(low, R"("first":32,"last":40)"),
+        AnswerFor(low, R"("first":34,"last":40)"), AnswerFor(low, R"("first":33,"last":32)"),
+        AnswerFor(R"("first":0,"last":32)", high),
+        AnswerFor(R"("first":-2147483648,"last":32)", high)}) {
+    EXPECT_EQ(WhyNone(answer), "its answer is malformed") << answer;
+  }
 }
