@@ -1,5 +1,6 @@
 #include "simulator/show/page_judgements.h"
 
+#include <algorithm>
 #include <string>
 #include <vector>
 
@@ -61,14 +62,12 @@ std::vector<Said> JudgementsOf(const Report& report) {
 
 // Uses only the tool's own items. ByInstaller shows the installer's refusals.
 Said ByTool(const Report& report) {
-  size_t done = 0;
   std::vector<std::string> why;
   for (const Item& item : report.items) {
-    if (item.state == ItemState::kDone) ++done;
     if (item.state != ItemState::kRefused || !IsByTool(item)) continue;
     why.push_back(NameOf(item) + ": " + item.reason.Text());
   }
-  const bool is_signed = done > 0;
+  const bool is_signed = std::any_of(report.items.begin(), report.items.end(), IsSigned);
   const char* const outcome = !is_signed    ? "signs nothing"
                               : why.empty() ? "signs it"
                                             : "signs only a part of it";

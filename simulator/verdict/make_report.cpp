@@ -101,6 +101,10 @@ bool IsByTool(const Item& item) {
          item.kind != ItemKind::kWarnings;
 }
 
+bool IsSigned(const Item& item) {
+  return item.state == ItemState::kDone && item.kind != ItemKind::kKey;
+}
+
 ExitStatus StatusOf(Verdict verdict) {
   constexpr ExitStatus kStatuses[] = {kAllSigned,   kAllSigned,     kAllSigned,   kSomeRefused,
                                       kSomeRefused, kSomeRefused,   kSomeRefused, kSomeRefused,
@@ -205,15 +209,12 @@ Verdict Judge(const std::vector<Item>& items) {
   const auto is_refused = [](const Item& item) {
     return item.state == ItemState::kRefused && IsByTool(item);
   };
-  const auto is_signed = [](const Item& item) {
-    return item.state == ItemState::kDone && item.kind != ItemKind::kKey;
-  };
   const bool is_jar = items[0].kind == ItemKind::kJar;
   if (items[0].reason.cause == &cause::kJarNotTrusted) return Verdict::kNotTrustedJar;
   if (std::none_of(items.begin(), items.end(), is_refused)) {
     return is_jar ? Verdict::kTrustedJar : Verdict::kSigned;
   }
-  const bool is_partly = std::any_of(items.begin(), items.end(), is_signed);
+  const bool is_partly = std::any_of(items.begin(), items.end(), IsSigned);
   return is_partly ? Verdict::kPartlySigned : Verdict::kRefused;
 }
 

@@ -142,6 +142,9 @@ const CertificateFacts* OtherSigner(const Judgement& judgement, const Report& re
 // about a demand that is not met (gate.h).
 bool IsByTool(const Item& item);
 
+// True for a file that was signed in this run. A registered key is no file.
+bool IsSigned(const Item& item);
+
 // The exit status for a verdict.
 ExitStatus StatusOf(Verdict verdict);
 

@@ -394,6 +394,15 @@ TEST(Page, ToolSignsAPackageThatTheGateRefuses) {
   EXPECT_TRUE(Has(PageOf(report), "</span> signs it</td>"));
 }
 
+// The tool registers the key even if the kernel refuses to sign.
+TEST(Page, ToolThatOnlyRegistersTheKeySignsNothing) {
+  Report report = Example(Verdict::kRefused);
+  report.chain = {{"key", LinkState::kHolds, ""}};
+  report.items = {Library("lib/arm/a.so", &cause::kLibraryChanged),
+                  {ItemKind::kKey, "com.example.app", "", ItemState::kDone, {}}};
+  EXPECT_TRUE(Has(PageOf(report), "</span> signs nothing</td>"));
+}
+
 // The name and the value of an option stay on one line, and no text is lost.
 TEST(Page, KeepsOptionsOnOneLine) {
   Report report = Example(Verdict::kSigned);
