@@ -8,8 +8,8 @@
 namespace ApkTools {
 
 // Deliberate: this is a pointer that a program may change, not a constant. The pointer is read each
-// time the manifest's entry is looked up. The names that need no digest (CanSkipValidation) are a
-// separate table, which a change of the pointer does not affect.
+// time the manifest's entry is looked up. CanSkipValidation has a table of the names that need no
+// digest. A change of the pointer does not change this table.
 const char* Apk::kMANIFEST_MF = "META-INF/MANIFEST.MF";
 
 void Apk::Init(int fd, const char* path) {
@@ -32,8 +32,8 @@ void Apk::Init(int fd, const char* path) {
   is_good_apk_ = VerifyPackage(std::move(android_manifest));
 }
 
-// Verifies the signature, and then the digest of META-INF/MANIFEST.MF. Only then parses that file
-// and AndroidManifest.xml. The digest of AndroidManifest.xml is not checked.
+// Verifies the signature, and then the digest of META-INF/MANIFEST.MF. Parses META-INF/MANIFEST.MF
+// and AndroidManifest.xml only after both checks. The digest of AndroidManifest.xml is not checked.
 bool Apk::VerifyPackage(std::vector<uint8_t> android_manifest) {
   std::vector<uint8_t> manifest;
   if (ExtractEntry(kMANIFEST_MF, manifest) != 0) return false;

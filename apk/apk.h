@@ -3,10 +3,10 @@
 //
 // An Apk owns its facts, but not the descriptor that the caller passes. It never writes to the
 // file. The destructor closes neither the archive nor the descriptor, because the tool's process
-// ends right after the run. A process that continues must call Release(). Nothing throws. The
-// constructor sets flags that show which steps succeeded, and the checks return true or false.
-// Every failure is logged as an error where it is found, unless a comment says otherwise. An object
-// must be used by one thread only.
+// ends right after the run. A process that continues must call Release(). Nothing throws. Init sets
+// flags that show which steps succeeded, and the checks return true or false. Every failure is
+// logged as an error where it is found, unless a comment says otherwise. An object must be used by
+// one thread only.
 #pragma once
 
 #include <cstdint>
@@ -30,7 +30,6 @@ class Apk {
   // The name of the manifest's entry. A program may set this pointer to another name.
   static const char* kMANIFEST_MF;
 
-  // Like Init(fd, nullptr) on an empty object.
   explicit Apk(int fd) { Init(fd, nullptr); }
   Apk(const Apk&) = delete;
   Apk& operator=(const Apk&) = delete;
@@ -39,19 +38,19 @@ class Apk {
   // archive is a package: Init then verifies its JAR signature and reads its manifests.
   //
   // `fd`: the file, open for reading. The caller keeps it open for the life of the object and
-  // closes it. If `fd` is -1, Init opens `path` itself. Release() closes that descriptor if the
-  // file is a zip archive. Otherwise it stays open until the process ends.
+  // closes it. If `fd` is -1, Init opens `path` itself. Release() closes Init's descriptor of a zip
+  // archive. Init's descriptor of any other file stays open until the process ends.
   // `path`: the file's name. If `path` is null, Init uses the descriptor's name in /proc.
   //
-  // Verification fails without a message if "META-INF/MANIFEST.MF" is missing or cannot be
+  // Verification fails without a message if the entry kMANIFEST_MF is missing or cannot be
   // extracted.
   //
-  // The flags below show the outcome. A second call first clears the flags. Facts that the second
-  // call does not set keep their former values.
+  // IsGoodZip, IsApk and IsGoodApk show the outcome. A second call first clears all flags. Other
+  // facts that the second call does not set keep their former values.
   void Init(int fd, const char* path);
 
-  // Closes the archive, and the descriptor if Init opened it. The facts stay. The caller must not
-  // read an entry afterwards, and StartIteration fails. A second call does nothing.
+  // Closes the archive, and its descriptor if Init opened the descriptor. The facts stay. The
+  // caller must not read an entry afterwards. Release() does nothing if no archive is open.
   void Release() { CloseArchive(std::exchange(zip_handle_, nullptr)); }
 
   // The path given to Init, or the descriptor's path; may be empty.
@@ -64,17 +63,18 @@ class Apk {
   bool IsApk() const { return is_apk_; }
   // The package attribute of the Android manifest, UTF-8; may be empty.
   const std::string& GetPackageName() const { return package_name_; }
-  // The signer's RSA modulus if Init verified the signature block, otherwise empty. Big-endian; one
-  // leading zero byte is left out.
+  // The signer's RSA modulus from the last signature block that InitCertSf verified. Empty if
+  // InitCertSf verified no block. Big-endian; one leading zero byte is left out.
   const std::vector<uint8_t>& GetManufacturerKey() const { return manufacturer_key_; }
-  // The Android manifest asks for the secure-storage permission, or declares this permission.
+  // The Android manifest was parsed, and asks for or declares the secure-storage permission.
   bool IsSsPermissionRequired() const { return ss_permission_required_; }
 
-  // Iterate over the entries of the archive, which must be open. Results are the zip library's
-  // codes (0: success). StartIteration stores a cookie for the entries whose names begin with
-  // `prefix` and end with `suffix`. An empty `prefix` or `suffix` excludes no name. Each call of
-  // Next stores the next entry, in the library's order. Next returns -1 after the last entry, and
-  // changes `name` only if the result is 0. EndIteration releases the cookie.
+  // Iterate over the entries of the archive. Results are the zip library's codes (0: success). Apk
+  // does not log failures of these functions. StartIteration stores a cookie for the entries whose
+  // names begin with `prefix` and end with `suffix`. An empty `prefix` or `suffix` excludes no
+  // name. StartIteration fails if no archive is open. Each call of Next stores the next entry, in
+  // the library's order. Next returns -1 after the last entry, and changes `name` only if the
+  // result is 0. EndIteration releases the cookie.
   int32_t StartIteration(void** cookie, const std::string& prefix, const std::string& suffix) {
     return StartZipIteration(zip_handle_, cookie, prefix, suffix);
   }
@@ -96,8 +96,8 @@ class Apk {
   bool VerifyCertificate(std::vector<uint8_t>& block, std::vector<uint8_t>& sha1,
                          std::vector<uint8_t>& sha256, std::vector<uint8_t>& md5,
                          std::vector<uint8_t>& key);
-  // True if the "-Digest-Manifest" attribute of the signature file is the digest of `manifest`, the
-  // manifest's raw bytes.
+  // True if the "…-Digest-Manifest" attribute of the signature file is the digest of `manifest`,
+  // the manifest's raw bytes.
   bool ValidateManifest(const std::vector<uint8_t>& manifest);
   // True if `expected` is the digest of `data` by the algorithm that `digest_name` names
   // ("SHA1-Digest" or "SHA-256-Digest"). A mismatch is not logged.
@@ -148,9 +148,8 @@ class Apk {
   std::vector<uint8_t> manufacturer_key_;
   bool ss_permission_required_ = false;
   std::string package_name_;
-  // The content of the entry or file that was digested last. Its memory is reused for the next
-  // entry or file. For large libraries, freeing and allocating it again would cost 2 % of the
-  // tool's time.
+  // The content that VerifyContent read last. The memory is reused for the next entry or file. For
+  // large libraries, freeing the memory and allocating it again would cost 2 % of the tool's time.
   std::vector<uint8_t> content_;
 };
 

@@ -21,7 +21,7 @@ bool Apk::FindFile(const char* path) {
   if (fd_ == -1) {
     fd_ = open(path, O_RDONLY | O_CLOEXEC);
     // Deliberate: descriptor 0 counts as a failure, because it belongs to standard input. open
-    // returns 0 only in a process that was wrongly started without standard input.
+    // returns 0 only if the standard input of the process is closed.
     if (fd_ < 1) {
       LogError("open('%s') failed: %s\n", path, strerror(errno));
       return false;

@@ -4,7 +4,7 @@
 
 namespace {
 
-// The index of each character is its value.
+// The index of a character is the 6-bit value that the character encodes.
 constexpr std::string_view kAlphabet =
     "ABCDEFGHIJKLMNOPQRSTUVWXYZabcdefghijklmnopqrstuvwxyz0123456789+/";
 
@@ -22,9 +22,8 @@ int base64decode(const char* in, size_t length, uint8_t* out, size_t* out_length
   size_t written = 0;
   uint32_t accumulator = 0;
   int collected = 0;  // number of 6-bit values in the accumulator
-  // Writes the whole bytes of the accumulator. Returns false if they do not fit. Deliberate:
-  // leftover bits are dropped without an error. A single 6-bit value is less than a byte, and is
-  // also dropped.
+  // Writes the whole bytes of the accumulator. Returns false if they do not fit. Deliberate: bits
+  // that do not fill a byte are dropped without an error. A single 6-bit value is thus dropped.
   const auto flush = [&] {
     const size_t count = collected < 2 ? 0 : static_cast<size_t>(collected) - 1;
     if (*out_length - written < count) return false;

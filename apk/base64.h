@@ -8,7 +8,7 @@
 #include <string>
 #include <vector>
 
-// The bytes that `text` encodes; empty if base64decode() refuses it.
+// The bytes that `text` encodes; empty if base64decode() returns 1.
 std::vector<uint8_t> Base64Decode(const std::string& text);
 
 // Decodes the `length` characters at `in` into `out`, which has space for `*out_length` bytes. `in`

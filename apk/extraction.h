@@ -16,7 +16,8 @@ inline constexpr int32_t kZipInconsistentInformation = -9;
 inline constexpr int32_t kZipAllocationFailed = -13;
 
 // A limit for the declared length of an entry, in bytes. Up to this limit, memory is allocated
-// before the data is read. The data of a longer entry is first read once, to check its length.
+// before the data is read. If an entry declares more, its data is first read once, to check that
+// the data has the declared length.
 inline constexpr uint32_t kZipTrustedLength = 64 << 20;
 
 // True if the declared length is possible for the entry's compressed length. For a stored entry,
@@ -25,11 +26,12 @@ inline constexpr uint32_t kZipTrustedLength = 64 << 20;
 // bytes.
 bool IsPlausibleLength(const ZipEntry& entry);
 
-// Extracts the whole entry into `out`, which then has the entry's length. If the declared length is
-// impossible, returns kZipInconsistentInformation and leaves `out` unchanged. If the entry is
-// longer than kZipTrustedLength, `out` also stays unchanged in two cases: the first reading of the
-// data fails, for example because of its length (returns the library's code), or the entry does not
-// fit in memory (returns kZipAllocationFailed).
+// Extracts the whole entry into `out`. If the declared length is impossible, returns
+// kZipInconsistentInformation. If the declared length is more than kZipTrustedLength, the data is
+// first read once: if this reading fails, returns the library's code. If the entry then does not
+// fit in memory, returns kZipAllocationFailed. In these three cases, `out` stays unchanged. In all
+// other cases, `out` gets the declared length. The result is then the library's code for the
+// extraction.
 int32_t ExtractZipEntry(ZipArchiveHandle archive, ZipEntry* entry, std::vector<uint8_t>& out);
 
 }  // namespace ApkTools

@@ -29,10 +29,10 @@ bool IsPlainText(const uint8_t* eight) {
 
 // The state machine that reads the text of a manifest.
 //
-// The parser is lenient where signing tools differ. Lines may have any length, and end with CR LF,
-// LF CR, CR or LF. A line without a colon becomes part of the next name. The parser is strict about
-// the byte after a colon. Unusual line breaks decide which digest belongs to which entry, so tests
-// pin how the parser reads them.
+// The parser is lenient where signing tools differ. Lines may have any length, and may end with
+// CR LF, LF CR, CR or LF. A name extends to the next colon, and may contain line breaks. The parser
+// is strict about the byte after this colon: it must be a space, CR or LF. Unusual line breaks
+// decide which digest belongs to which entry, so tests pin how the parser reads them.
 class Parser {
  public:
   Parser(std::vector<uint8_t>& text, ManifestSections& sections)
@@ -58,8 +58,8 @@ class Parser {
   };
 
   // Deliberate: each step sets one of the states above, so no test can reach the message below.
-  // This check is kept for a state that is added later, after P_EOL, without a case in step(). A
-  // manifest that reaches such a state is then refused.
+  // This check is for a state that somebody adds after P_EOL, without a case in step(). The parser
+  // then refuses the manifest.
   bool isExpectedState() const {
     const bool is_expected = state_ <= P_EOL;
     if (!is_expected) LogError("Parse manifest: Unexpected state.\n");
@@ -94,16 +94,16 @@ class Parser {
     state_ = P_KEY;
   }
 
-  // Deliberate: a line break does not end a name. A line without a colon becomes the front part of
-  // the next line's name. Such a name equals no name that the tool looks for. If it ends like the
-  // name of a digest, the digest counts as unsupported.
+  // Deliberate: a line break does not end a name. If the line of the name has no colon, the name
+  // continues on the next line. A name with a line break equals no name that the tool looks for. If
+  // a name with a line break ends like the name of a digest, the digest counts as unsupported.
   bool readName() {
     storePair();
     size_t end = cursor_;
     while (byteAt(end) != ':' && byteAt(end) != '\0') ++end;
     pending_.name = readTo(end);
     if (byteAt(end) == '\0') {
-      // A log record has no space for more of a long name.
+      // A log record has at most kLogTextSize bytes of text. The rest of a long name is not copied.
       const size_t shown = std::min<size_t>(pending_.name.length, kLogTextSize);
       const std::string name(reinterpret_cast<const char*>(text_) + pending_.name.start, shown);
       LogError("Parse manifest: Error: P_KEY: unexpected end of file after key '%s'\n",

@@ -23,7 +23,7 @@ class ManifestMf {
 
   // Discards the former text and parses `text`, which may have any bytes. Returns false if `text`
   // does not parse. The sections that ended before the fault are then kept. A text of 4 GiB or more
-  // is refused without a message, because no entry of an archive is that long.
+  // is refused without a message. No entry of an archive is that long.
   bool load(std::vector<uint8_t> text);
   bool load(const std::string& text) {
     return load(std::vector<uint8_t>(text.begin(), text.end()));

@@ -27,8 +27,9 @@ std::string_view ManifestSection::find(std::string_view name) const {
 }
 
 // Deliberate: if a section has several digests, the last in the byte order of their names counts.
-// "SHA1-Digest" therefore wins over "SHA-256-Digest", both for an entry and for the whole manifest.
-// Packages with both digests have always been verified by this rule.
+// "SHA1-Digest" therefore wins over "SHA-256-Digest" for an entry, and "SHA1-Digest-Manifest" over
+// "SHA-256-Digest-Manifest" for the whole manifest. Packages with SHA-1 and SHA-256 digests have
+// always been verified by this rule.
 ManifestSection::value_type ManifestSection::findLastEndingIn(std::string_view suffix) const {
   for (size_t i = size_; i > 0; --i) {
     if (EndsWith(View(text_, attributes_[i - 1].name), suffix)) return (*this)[i - 1];
@@ -42,11 +43,11 @@ ManifestSection ManifestSections::operator[](size_t index) const {
 }
 
 void ManifestSections::reset(const uint8_t* text, size_t size) {
-  // The table is reserved at once, because a table that grows in steps wastes the memory of its
-  // former sizes. Reserving takes only addresses: the system provides the memory page by page when
-  // the table is written. Few attributes take fewer than kShortAttribute bytes of text.
-  // kManyAttributes are enough for two attributes of each of the 65,535 entries that an archive
-  // without zip64 can have.
+  // Reserves the table once, because a growing table needs its old and its new memory at the same
+  // time. Reserving takes only addresses: the system provides the memory page by page when the
+  // table is written. Most attributes take at least kShortAttribute bytes of text, so the table
+  // rarely grows later. kManyAttributes are enough for two attributes of each of the 65,535 entries
+  // that an archive without zip64 can have.
   constexpr size_t kShortAttribute = 32;
   constexpr size_t kManyAttributes = 1 << 17;
   text_ = reinterpret_cast<const char*>(text);
@@ -56,10 +57,11 @@ void ManifestSections::reset(const uint8_t* text, size_t size) {
   patience_ = kLittleText;
 }
 
-// From time to time, sorts the open section. The sort drops repeated names, which could otherwise
-// fill the table. Each sort compares all names of the section, so the next sort waits for more
-// text: kLittleText bytes, and for each name its length and kTwoAttributes bytes. kTwoAttributes is
-// the length of two short attributes, such as "A: b", with their line ends.
+// Sorts the open section if the new attribute starts at or after the offset patience_. The sort
+// drops repeated names, which could otherwise fill the table. Each sort compares all names of the
+// section. To save time, the next sort waits for as many bytes of text as these names have in
+// total, plus kTwoAttributes for each name, plus kLittleText. kTwoAttributes is the length of two
+// short attributes, such as "A: b", with their line ends.
 void ManifestSections::add(const ManifestAttribute& attribute) {
   constexpr size_t kTwoAttributes = 10;
   attributes_.push_back(attribute);

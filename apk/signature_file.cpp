@@ -91,8 +91,9 @@ bool Apk::VerifyCertificate(std::vector<uint8_t>& block, std::vector<uint8_t>& s
     LogError("RSA could not verify data: %X\n", static_cast<unsigned>(result));
     return false;
   }
-  // Deliberate: a key longer than kLongestKey never verifies above, so no test reaches this line.
-  // The guard limits the key's length even if the limit of rsa_pkcs1_verify is raised later.
+  // Deliberate: a key longer than kLongestKey never verifies above, so no test makes this condition
+  // true. The condition limits the key's length even if the limit of rsa_pkcs1_verify is raised
+  // later.
   if (record.modulus_length > kLongestKey) return false;
   key.assign(record.modulus, record.modulus + record.modulus_length);
   return true;
@@ -121,8 +122,8 @@ bool Apk::ValidateManifest(const std::vector<uint8_t>& manifest) {
 bool Apk::VerifyData(const std::string& digest_name, const std::vector<uint8_t>& expected,
                      const std::vector<uint8_t>& data) {
   // Deliberate: only SHA-1 and SHA-256 digests are supported. apksigner writes one of the two into
-  // every manifest. Other digests (MD5, SHA-512) are refused. The rule for signatures is different:
-  // old packages have signatures over MD5 digests, and these signatures verify.
+  // every manifest. Other digests (MD5, SHA-512) are refused. Signatures have another rule: a
+  // signature over an MD5 digest is supported, because old packages can have such a signature.
   std::vector<uint8_t> computed;
   if (digest_name == "SHA1-Digest") {
     ComputeSHA1Digest(data, computed);
@@ -149,16 +150,17 @@ bool FitsInBlock(const std::vector<uint8_t>& block, const uint8_t* start, size_t
 int LoadKey(const std::vector<uint8_t>& block, const pkcs7& record, rsa_context& key) {
   if (!FitsInBlock(block, record.modulus, record.modulus_length)) return kRsaBadInput;
   // Deliberate: the exponent's four bytes are read in host byte order, although certificates store
-  // the high byte first. The result is right for an exponent of one byte and for 65537. Signing
-  // tools use no other exponents.
+  // the high byte first. The result is right for an exponent of one byte and for 65537. The usual
+  // signing tools use no other exponents.
   uint32_t exponent;
   memcpy(&exponent, record.exponent, sizeof(exponent));
   if (rsa_is_forgeable(exponent)) return kRsaBadInput;
   return rsa_set_key(&key, record.modulus, nullptr, exponent, record.modulus_length);
 }
 
-// Calls rsa_pkcs1_verify for a signature in the block. The signature is as long as the modulus; the
-// length in the block is ignored. Returns kRsaBadInput if the block ends before the signature does.
+// Verifies the signature that starts at `signature` in the block. Reads as many bytes as the
+// modulus has, and ignores the signature's length field. Returns kRsaBadInput if the block has
+// fewer bytes left. Otherwise returns the result of rsa_pkcs1_verify.
 int VerifySignature(const rsa_context& key, const std::vector<uint8_t>& block,
                     const Digests& digests, const uint8_t* signature) {
   if (!FitsInBlock(block, signature, static_cast<size_t>(key.len))) return kRsaBadInput;

@@ -1,5 +1,5 @@
-// The functions of the platform's zip library that accept or return names, in one form for all
-// releases.
+// Wraps the functions of the platform's zip library that accept or return entry names. The wrappers
+// are the same for all releases of the library.
 //
 // The library has two generations. Its functions accept names as `ZipString` up to API 29, and as
 // std::string_view later. In the tool, only this file depends on the difference. The library
@@ -25,8 +25,8 @@ inline constexpr int32_t kZipInvalidEntryName = -10;
 // The length in bytes of the longest name that a zip archive and a `ZipString` can have.
 inline constexpr size_t kZipLongestName = 0xffff;
 
-// The type of a name in the installed library. The first overload exists only if FindEntry takes a
-// std::string_view, that is, in the later generation.
+// ZipName is the type of a name in the library of this build. The first overload of ZipNameFor
+// exists only in the later generation, in which FindEntry accepts a std::string_view.
 template <typename Entry>
 auto ZipNameFor(Entry* entry)
     -> decltype(FindEntry(ZipArchiveHandle(), std::string_view(), entry), std::string_view());
@@ -52,14 +52,15 @@ std::string_view ZipNameText(const Name& name) {
   return {reinterpret_cast<const char*>(name.name), name.name_length};
 }
 
-// A filter of names. In the older generation, a null pointer is the empty filter.
+// Returns `name` in the form in which StartIteration accepts a prefix or a suffix. In the older
+// generation, a null pointer replaces an empty name.
 inline std::string_view ZipFilter(std::string_view name) { return name; }
 template <typename Name>
 const Name* ZipFilter(const Name& name) {
   return name.name_length == 0 ? nullptr : &name;
 }
 
-// Finds the entry of this name. The name may contain any bytes.
+// Finds the entry whose name is `text`. `text` may contain any bytes.
 inline int32_t FindZipEntry(ZipArchiveHandle archive, const std::string& text, ZipEntry* entry) {
   if (text.size() > kZipLongestName) return kZipInvalidEntryName;
   ZipName name;
@@ -80,7 +81,7 @@ inline int32_t StartZipIteration(ZipArchiveHandle archive, void** cookie, const 
   return StartIteration(archive, cookie, ZipFilter(first), ZipFilter(last));
 }
 
-// Returns the next entry and its name; `name` is unchanged unless the result is 0.
+// Returns the next entry and its name. Changes `name` only if the result is 0.
 inline int32_t NextZipEntry(void* cookie, ZipEntry* entry, std::string& name) {
   ZipName found;
   const int32_t result = Next(cookie, entry, &found);

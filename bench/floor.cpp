@@ -1,6 +1,6 @@
-// bench_floor FILE: does the tool's job without the verification. Its cost is the floor, a lower
-// bound for the tool's cost. The program opens the archive, extracts and digests the same entries
-// and libraries as the tool, and writes the same log.
+// bench_floor FILE: does the tool's job without the verification. The cost of this program is the
+// floor, a lower bound for the tool's cost. The program extracts the same entries as the tool and
+// reads the same libraries. It digests the same bytes and writes the same log.
 #include <openssl/md5.h>
 #include <openssl/sha.h>
 

@@ -1,6 +1,5 @@
 // The steps that bench_floor and bench_peer share. They are all of the tool's job except the
-// verification. Each step is done once, and only needed data is kept. Both programs read only the
-// good packages that bench_packages makes, and exit if anything unexpected happens.
+// verification. Both programs are only for the good packages that bench_packages makes.
 #pragma once
 
 #include <cstdint>
@@ -9,7 +8,8 @@
 #include <string>
 #include <string_view>
 
-// A buffer whose bytes are not cleared before they are filled. It never shrinks.
+// A buffer that is used again and again. Resize() does not clear the bytes. A smaller size does not
+// free memory.
 class Buffer {
  public:
   void Resize(size_t size);
@@ -23,6 +23,7 @@ class Buffer {
   size_t room_ = 0;
 };
 
+// Prints `why` to standard error, and ends the program with status 1.
 [[noreturn]] void GiveUp(const char* why);
 
 // The package that a program was started with.

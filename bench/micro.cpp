@@ -21,7 +21,8 @@ namespace {
 
 std::string KeyOf(const benchmark::State& state) { return "rsa-" + std::to_string(state.range(0)); }
 
-// The modulus of the test key, as bytes and as limbs, and a smaller number of the same length.
+// The modulus of the test key `key`, as bytes (`modulus`) and as an integer (N). A is a smaller
+// number of the same length. T is scratch space.
 struct Operands {
   explicit Operands(const std::string& key) : modulus(ModulusOf(key)) {
     mpi_from_bytes(&N, modulus.data(), modulus.size());

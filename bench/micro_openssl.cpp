@@ -1,5 +1,6 @@
 // Measures the RSA public operation of the host's OpenSSL. This is a separate program, because
-// bench_micro links the platform's libcrypto, whose functions have the same names.
+// bench_micro links the platform's libcrypto, whose functions have the same names as those of
+// the host's OpenSSL.
 #include <benchmark/benchmark.h>
 #include <openssl/bn.h>
 #include <openssl/core_names.h>

@@ -1,5 +1,5 @@
-// bench_packages DIRECTORY: makes the packages that the benchmarks measure. Each is
-// DIRECTORY/<name>/base.apk with its libraries extracted beside it, as an installer leaves them.
+// bench_packages DIRECTORY: makes the packages that scripts/bench measures. Each package is
+// DIRECTORY/<name>/base.apk. Its libraries are extracted beside it, as an installer leaves them.
 //
 // The contents are copied from the machine's own libraries and from the files of /usr/share. Zeros
 // or random bytes would not inflate at the same speed as the contents of a real package.
@@ -19,13 +19,15 @@ namespace {
 
 struct Plan {
   const char* name;
-  size_t entries;  // all entries except the signature's own
+  size_t entries;  // all entries outside META-INF
   size_t libraries;
   size_t library_size;
   size_t dex_size;
-  size_t entry_size;  // of each entry that is neither classes.dex nor a library
+  size_t entry_size;  // of each entry below res/ or assets/
   const char* key = "rsa-2048";
-  bool in_order = true;  // true: sorted by name, as by apksigner; false: unsorted, as by jarsigner
+  // True: the sections of MANIFEST.MF are sorted by name, as apksigner writes them. False: they are
+  // not sorted, as jarsigner writes them.
+  bool in_order = true;
 };
 
 constexpr size_t kKilo = 1000, kMega = 1000 * kKilo;
@@ -43,7 +45,7 @@ constexpr Plan kPlans[] = {
 };
 
 // Returns the bytes of all files of at least `least_size` bytes below a directory, one file after
-// the other. After the last file it continues with the first.
+// the other. After the last file, Next() continues with the first file.
 class CircleOfFiles {
  public:
   CircleOfFiles(const std::string& directory, size_t least_size);

@@ -1,5 +1,5 @@
-// bench_peer FILE: does the tool's job with OpenSSL. It uses OpenSSL's PKCS#7, X.509 and digests,
-// and a hash table of the manifest's entries.
+// bench_peer FILE: does the tool's job with OpenSSL's functions for PKCS#7, X.509 and digests. This
+// program looks up the digests of entries in a hash table.
 #include <openssl/evp.h>
 #include <openssl/pkcs7.h>
 #include <openssl/rsa.h>
@@ -54,8 +54,8 @@ int main(int argc, char** argv) {
 
 namespace {
 
-// Returns the signer's modulus. As in the tool, the certificate must be signed with its own key,
-// and its issuer is not checked.
+// Returns the signer's modulus. Like the tool, this function requires that the certificate is
+// signed with its own key. Like the tool, it does not check the issuer.
 std::vector<uint8_t> VerifySignature(const Buffer& block, const Buffer& signature_file) {
   const uint8_t* at = block.data();
   PKCS7* const pkcs7 = d2i_PKCS7(nullptr, &at, static_cast<long>(block.size()));

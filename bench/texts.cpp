@@ -1,5 +1,6 @@
-// bench_texts: measures the memory and time that the readers of META-INF/MANIFEST.MF and of the
-// compiled Android manifest need for the worst texts. Prints a line for each text:
+// bench_texts: measures the peak memory and the time that the tool needs to read a manifest. A
+// "text" is one input: a META-INF/MANIFEST.MF or a compiled Android manifest. The texts are chosen
+// to need much memory or time. Prints a line for each text:
 //
 //   READER <TAB> NAME <TAB> peak bytes for each byte of the text <TAB> nanoseconds for each byte
 //
@@ -26,7 +27,8 @@ namespace {
 
 constexpr size_t kTextSize = 64 << 20;
 
-// Appends pieces until the text is long enough. `make_piece` makes a piece from its number.
+// Joins make_piece(0), make_piece(1) and so on until the text has kTextSize bytes. Then appends two
+// line ends.
 template <typename MakePiece>
 std::vector<uint8_t> Repeat(const MakePiece& make_piece) {
   std::vector<uint8_t> text;
@@ -81,8 +83,9 @@ constexpr Text kTexts[] = {
     {"one name without end", [] { return Repeat([](size_t) { return "A"; }); }},
 };
 
-// A document has kManyNodes nodes, and its one long text has kLongName characters. Such a document
-// deflates to a thousandth of its size, so a small package can contain it.
+// A document has one string of kLongName characters, and kManyNodes equal nodes. Because the nodes
+// are equal, deflate makes the document more than 300 times smaller. A small package can therefore
+// contain such a document.
 constexpr size_t kManyNodes = 1 << 20;
 constexpr size_t kLongName = 30000;
 
@@ -126,7 +129,7 @@ constexpr Reader kReaders[] = {
      std::size(kDocuments)},
 };
 
-// The peak memory of the process since ResetPeak.
+// The peak memory of the process since ResetPeak, in KiB; 0 if it is not known.
 long PeakKilobytes() {
   std::ifstream status("/proc/self/status");
   for (std::string word; status >> word;) {
@@ -150,7 +153,7 @@ void Measure(const Reader& reader, const Text& text) {
          static_cast<double>(PeakKilobytes()) * 1024 / size, time.count() / size);
 }
 
-// Measures in a child process. Returns false if that failed.
+// Calls Measure in a child process. Returns false if the child cannot be started or fails.
 bool MeasureApart(const Reader& reader, const Text& text) {
   fflush(stdout);
   const pid_t child = fork();

@@ -1,6 +1,7 @@
-# The language level and the warnings of every target, and stricter rules for the tool's own code.
-# Only the developers' presets turn warnings into errors. A new warning of a newer compiler must not
-# stop a package build.
+# The language level, the warnings and the hardening of every target, and stricter rules for the
+# tool's own code. Options add sanitizers and coverage. Only the developers' presets
+# (CMakePresets.json) turn warnings into errors. A new warning of a newer compiler must not stop
+# other builds, such as that of a Debian package.
 set(CMAKE_CXX_STANDARD 17)
 set(CMAKE_CXX_STANDARD_REQUIRED ON)
 set(CMAKE_CXX_EXTENSIONS OFF)
@@ -16,10 +17,10 @@ set(APKTOOLKIT_TOOL_OPTIONS -fno-exceptions -fno-rtti -Wconversion)
 
 # The hardening that the platform uses for its own programs. Symbols are bound before the program
 # starts, and their table is then read-only. Programs can be loaded at any address. The stack is
-# protected. Calls of C library functions are checked where the compiler knows the size of the
-# buffer. On 64-bit Arm, jumps and returns are protected, too. scripts/check-binary checks that
-# compiled files have this hardening. It checks the protection of jumps and returns only in object
-# files and static libraries.
+# protected. Calls of C library functions such as memcpy are checked where the compiler knows the
+# size of the buffer. On 64-bit Arm, jumps and returns are protected, too. scripts/check-binary
+# checks that compiled files have this hardening. It checks the protection of jumps and returns only
+# in object files and static libraries.
 option(APKTOOLKIT_HARDEN "Harden programs and libraries as the platform does" ON)
 if(APKTOOLKIT_HARDEN)
   include(CheckPIESupported)

@@ -1,7 +1,7 @@
-# Installs the files for programs that verify packages themselves (examples/): the tool's code and
-# the verification as static libraries, the headers of the verification, and the files for CMake's
+# Installs the files for programs that link the verification, such as examples/verify.cpp. They are
+# two static libraries (the tool's code, and library/), their headers, and the files for CMake's
 # find_package and for pkg-config. The directory include/apktoolkit has the layout of the sources,
-# so that each header finds the others under the names that it includes.
+# because the headers include each other by their paths in the sources.
 if(APKTOOLKIT_ZIPSTRING)
   return()  # this build uses the zip library of tests/compat, which is not installed
 endif()
@@ -29,8 +29,8 @@ install(FILES ${PROJECT_BINARY_DIR}/apktoolkit-config.cmake
 
 cmake_path(RELATIVE_PATH CMAKE_INSTALL_PREFIX
   BASE_DIRECTORY ${CMAKE_INSTALL_FULL_LIBDIR}/pkgconfig OUTPUT_VARIABLE APKTOOLKIT_PC_PREFIX)
-# The platform's libraries are named by their paths, so that no other libcrypto is found in place of
-# the platform's.
+# apktoolkit.pc names the platform's libraries by their paths. With -lcrypto, the linker could find
+# the host's libcrypto.
 list(TRANSFORM PLATFORM_LIBRARIES REPLACE "(.+)" "\${platformdir}/lib\\1.so"
   OUTPUT_VARIABLE APKTOOLKIT_PC_LIBRARIES)
 list(JOIN APKTOOLKIT_PC_LIBRARIES " " APKTOOLKIT_PC_LIBRARIES)

@@ -38,8 +38,8 @@ int asn1_get_next_bounded(const uint8_t* buf, size_t available, size_t bound, as
   if (!ReadIdentifier(&octets, hdr) || !ReadLength(&octets, hdr)) return -1;
 
   const size_t header_length = readable - octets.left;
-  // Deliberate: the remaining length is cut to 32 bits, because the field `length` of asn1_hdr has
-  // 32 bits.
+  // Deliberate: the remaining length is cut to 32 bits, as many as the field `length` of asn1_hdr
+  // has. The cut never increases the remaining length, so no accepted element ends beyond `bound`.
   const auto remaining = static_cast<uint32_t>(bound - header_length);
   if (hdr->length > remaining) return -1;
   hdr->payload = octets.position;
@@ -125,9 +125,9 @@ bool ReadLength(Octets* octets, asn1_hdr* hdr) {
     hdr->length = octet;
     return true;
   }
-  // The reserved octet 0xFF fails because its count is too large. Deliberate: the length may have
-  // more octets than DER allows. The indefinite form has the count 0 and reads as empty contents.
-  // Its end-of-contents octets are not searched for.
+  // The reserved octet 0xFF fails, because its count, 127, is too large. Deliberate: the length may
+  // have more octets than DER allows. The indefinite form has the count 0 and reads as empty
+  // contents. Its end-of-contents octets are not searched for.
   const uint32_t count = octet & 0x7f;
   if (count > kMaxLengthOctets) return false;
   for (uint32_t i = 0; i < count; ++i) {

@@ -41,36 +41,37 @@ struct asn1_oid {
 };
 
 // Reads the header at the start of the `len` bytes at `buf` into `hdr`. The element must end within
-// those bytes. Identifier and length octets need not be minimal. The low 32 bits of a long tag
-// number are kept. The indefinite form reads as length 0. Fails for more than four subsequent
-// length octets, and for the reserved first length octet 0xFF.
+// those bytes. Identifier and length octets need not be minimal. A tag number of more than 32 bits
+// is cut to its low 32 bits. The indefinite form reads as length 0. Fails for more than four
+// subsequent length octets, and for the reserved first length octet 0xFF.
 //
-// After a failure, `hdr` contains the fields that were decoded before the failure. Its payload is
-// null.
+// After a failure, `hdr->payload` is null. The other fields contain what was decoded before the
+// failure.
 int asn1_get_next(const uint8_t* buf, size_t len, asn1_hdr* hdr);
 
-// Like asn1_get_next, for callers that trust the length of an outer element, even if it reaches
-// beyond their buffer. The element must end within `bound` bytes from `buf`. The header must end
-// within both `bound` and `available` bytes. The contents may end beyond the `available` bytes. The
-// caller must not read beyond these bytes.
+// Like asn1_get_next, for a caller that trusts the length of an outer element, even if the outer
+// element ends beyond the `available` bytes at `buf`. The element at `buf` must end within `bound`
+// bytes. Its header must also end within the `available` bytes. Its contents may end beyond the
+// `available` bytes, but the caller must not read beyond the `available` bytes.
 int asn1_get_next_bounded(const uint8_t* buf, size_t available, size_t bound, asn1_hdr* hdr);
 
 // Decodes the `len` bytes at `buf`, the contents of an OBJECT IDENTIFIER (X.690 §8.19). Empty
 // contents have no arcs. The low 32 bits of each arc are kept. The first value, which encodes two
 // arcs, is cut to its low 64 bits before it is split. Fails for contents that end within an arc,
-// and for a 21st arc. `oid` then contains the arcs before the fault.
+// and for a 21st arc. After a failure, `oid` contains the arcs that were decoded before the
+// failure.
 int asn1_parse_oid(const uint8_t* buf, size_t len, asn1_oid* oid);
 
-// Reads a whole OBJECT IDENTIFIER element from the `len` bytes at `buf`. Sets `next` to the
-// position after the element, even if the read then fails because the contents are malformed. Also
-// fails for an element that is not an OBJECT IDENTIFIER, for a truncated element and for empty
-// contents. In these three cases, `oid` and `next` stay unchanged.
+// Reads a whole OBJECT IDENTIFIER element from the `len` bytes at `buf`. Fails if asn1_get_next
+// fails, if the element is not an OBJECT IDENTIFIER, or if its contents are empty. In these three
+// cases, `oid` and `next` stay unchanged. In all other cases, `next` becomes the position after the
+// element, even if asn1_parse_oid then fails for the contents.
 int asn1_get_oid(const uint8_t* buf, size_t len, asn1_oid* oid, const uint8_t** next);
 
 // Writes the arcs as dotted text into the `size` bytes at `buf`. The text is cut to fit and ends
-// with a NUL; a `size` of 0 writes nothing. The tool itself prints no object identifier: this
-// function is for tests, and for the diagnostics of programs that read certificates with this
-// library.
+// with a NUL. If `size` is 0, nothing is written. The tool itself prints no object identifier. This
+// function is for tests, and for the diagnostics of other programs that are linked with
+// apktoolkit_core.
 void asn1_oid_to_str(const asn1_oid* oid, char* buf, size_t size);
 
 // Returns the named bits of a BIT STRING (X.690 §8.6) as an integer. The contents are the `len`

@@ -13,7 +13,7 @@
 // 32 bits, even for 64-bit processors. It multiplies half limbs, so the compiler needs no
 // double-width type. The object code for the device has no wider multiplication either
 // (scripts/check android checks this). A compiler for another processor can choose a wider
-// multiplication: gcc does so for x86-64, for a vector of half limbs.
+// multiplication. For example, gcc for x86-64 chooses one for a vector of half limbs.
 
 namespace {
 
@@ -365,8 +365,8 @@ WRAPS_ON_PURPOSE int reduce(mpi* X, const mpi* B) {
   return 0;
 }
 
-// Returns the quotient digit of X / Y that belongs to limb i of X, or that digit plus one. t is the
-// index of Y's top limb.
+// Returns the quotient digit of X / Y for step i of the loop in `reduce`, or this digit plus one. t
+// is the index of Y's top limb.
 uint32_t quotient_digit(const mpi* X, int i, const mpi* Y, int t) {
   const uint32_t divisor[2] = {t >= 1 ? Y->p[t - 1] : 0, Y->p[t]};
   const uint32_t dividend[3] = {i >= 2 ? X->p[i - 2] : 0, X->p[i - 1], X->p[i]};

@@ -1,10 +1,10 @@
 // Multi-precision integers for the RSA public operation.
 //
-// A number owns its limbs. The limbs are allocated by malloc, and overwritten with zeros before
-// they are freed or replaced. No argument may be null, and no two arguments may be the same number,
-// except where the comment of an operation allows this. Operations that allocate return
-// kMpiNoMemory if malloc fails. The number that receives the result is then in a valid state. The
-// functions log nothing.
+// A number is an mpi, and owns its limbs. A limb is a digit of 32 bits. Limbs are allocated by
+// malloc, and overwritten with zeros before they are freed or replaced. No argument may be null,
+// and no two arguments may be the same number, except where the comment of an operation allows
+// this. Operations that allocate return kMpiNoMemory if malloc fails. The number for the result can
+// then still be used and freed, but its value may have changed. The functions log nothing.
 #pragma once
 
 #include <cstddef>
@@ -35,11 +35,13 @@ void mpi_init(mpi* X, ...) __attribute__((sentinel));
 // allowed. The list ends with a null pointer.
 void mpi_free(mpi* X, ...) __attribute__((sentinel));
 
-// Calls mpi_init or mpi_free for all numbers of a record. Each type of record has its overload.
-// This one is for a record that is a single number.
+// Calls `call`, which is mpi_init or mpi_free, for all numbers of a record. A record is a single
+// number, or a struct with numbers. Each type of record has an overload. This overload is for a
+// single number.
 inline void mpi_apply(void (*call)(mpi* X, ...), mpi* X) { call(X, nullptr); }
 
-// A record whose numbers start empty and are released when its scope ends.
+// Adds a constructor and a destructor to a record. The constructor sets all numbers to the empty
+// value. The destructor wipes and frees their limbs.
 template <typename Record>
 struct mpi_owner : Record {
   mpi_owner() : Record{} { mpi_apply(mpi_init, this); }
@@ -53,7 +55,7 @@ using mpi_local = mpi_owner<mpi>;
 // unchanged.
 int mpi_grow(mpi* X, int nblimbs);
 
-// X = A. X may be A. If X has more limbs than A needs, X keeps these limbs and they become zero.
+// X = A. X may be A. Limbs of X that A does not need are kept, and become zero.
 int mpi_assign(mpi* X, const mpi* A);
 
 // X = the unsigned big-endian number in the `len` bytes at `bytes`. An empty X gets only the limbs

@@ -66,18 +66,17 @@ WRAPS_ON_PURPOSE uint32_t montgomery_constant(uint32_t m0) {
   return 0 - x;
 }
 
-// Returns the window size for an exponent of `bits` bits: the number of exponent bits that one
-// product handles. A window of w bits needs about 2^(w-1) products for the table, and about one
-// product for every w + 1 bits of the exponent. The limits below keep the sum of these products
-// small. Deliberate: no window has 2 bits. Short exponents have few set bits in practice, so a
-// window of 2 bits would save no time.
+// Returns the number of bits in a window for an exponent of `bits` bits. A window of w bits needs
+// about 2^(w-1) products for the table, and about one product for every w + 1 bits of the exponent.
+// The limits below keep the total number of these products small. Deliberate: no window has 2 bits.
+// A window of 1 bit needs one product for each set bit of the exponent. Short exponents have few
+// set bits in practice, so a window of 2 bits would save no time.
 int window_size(int bits) {
   return bits > 671 ? 6 : bits > 239 ? 5 : bits > 79 ? 4 : bits > 23 ? 3 : 1;
 }
 
-// Computes the powers W[i] = W[1]^i for each index i of w bits whose highest bit is set. A full
-// window starts with a set bit, so it needs no other power. The exponent bits after the last full
-// window need only W[1].
+// Computes the powers W[i] = W[1]^i for 2^(w-1) <= i < 2^w. A full window starts with a set bit, so
+// it needs only these powers. The exponent bits after the last full window need only W[1].
 int fill_window(mpi_local* W, int w, montgomery* m) {
   const int j = 1 << (w - 1);
   if (const int result = m->copy(&W[j], &W[1])) return result;
@@ -89,7 +88,8 @@ int fill_window(mpi_local* W, int w, montgomery* m) {
   return 0;
 }
 
-// Computes W[1]^E in X, by a sliding window of w bits. X is 1 in Montgomery form before the call.
+// Computes X = W[1]^abs(E), by a sliding window of w bits. Before the call, X must be 1. All these
+// values except E are in Montgomery form.
 void raise(mpi* X, const mpi* E, const mpi_local* W, int w, montgomery* m) {
   int nbits = 0;
   int wbits = 0;

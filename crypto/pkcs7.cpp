@@ -12,17 +12,17 @@
 
 namespace {
 
-// The signature block. A position is an offset from the start of the block, and may be beyond its
-// end.
+// The signature block. Every offset is counted from the start of the block. An offset may be beyond
+// the end of the block.
 struct Block {
   const uint8_t* bytes;
   size_t length;
 
-  // Reads the header at `offset`. The header itself must be inside the block. The element must end
-  // within `bound` bytes from `offset`.
+  // Reads the header at `offset`. Fails if the header is not inside the block, or if the element
+  // does not end within `bound` bytes from `offset`.
   bool Read(size_t offset, size_t bound, asn1_hdr* hdr) const;
-  // Reads the header at `offset`. The element must end at or before `end`, which must be inside the
-  // block or at its end.
+  // Reads the header at `offset`. Fails if the element does not end at or before `end`. The caller
+  // must pass an `end` of at most `length`.
   bool ReadInside(size_t offset, size_t end, asn1_hdr* hdr) const;
   // The offsets where an element's contents start, and where they end.
   size_t Enter(const asn1_hdr& hdr) const { return static_cast<size_t>(hdr.payload - bytes); }
@@ -74,8 +74,8 @@ bool Block::ReadInside(size_t offset, size_t end, asn1_hdr* hdr) const {
 }
 
 // Reads the headers from the start of the block to the [0] of the certificates. Leaves the last
-// header in `hdr`. Deliberate: no tag is checked. Each element may be as long as the whole block,
-// counted from the element's own start, and may therefore end beyond the block.
+// header in `hdr`. Deliberate: no tag is checked. Each element, header included, may be as long as
+// the whole block. An element may therefore end beyond the block.
 WRAPS_ON_PURPOSE bool ReadHeaders(const Block& block, asn1_hdr* hdr) {
   if (!block.Read(0, block.length, hdr) || !block.Read(block.Enter(*hdr), block.length, hdr)) {
     return Fail("CANT PROCESS CERTIFICATE TAG");
@@ -127,8 +127,8 @@ bool ReadPublicKey(const Block& block, const x509_certificate& certificate, pkcs
   record->modulus = modulus.payload + zeros;
   record->modulus_length = modulus.length - zeros;
 
-  // Deliberate: the bound for the exponent, header included, is the length of the modulus, not the
-  // rest of the key. The exponent is copied, so its contents must be inside the block.
+  // Deliberate: the exponent, header included, may be as long as the contents of the modulus. The
+  // end of the key is no limit. The exponent is copied, so its contents must be inside the block.
   asn1_hdr exponent;
   if (!block.Read(block.Skip(modulus), modulus.length, &exponent)) return Fail(kUnreadable);
   if (exponent.tag != kAsn1Integer) return Fail(kNotAnInteger);
@@ -139,8 +139,8 @@ bool ReadPublicKey(const Block& block, const x509_certificate& certificate, pkcs
 
 // Deliberate: the fifth to the eighth byte of an exponent overwrite the modulus length, which
 // follows the exponent in the record. Later bytes are dropped. The exponents of ordinary keys have
-// at most three bytes. An attacker can choose the modulus length in this way, so the caller must
-// check it.
+// at most three bytes. With a longer exponent, an attacker can choose the modulus length. The
+// caller of processCert must therefore check the modulus length.
 void StoreExponent(const asn1_hdr& exponent, pkcs7* record) {
   constexpr size_t kStart = offsetof(pkcs7, exponent);
   constexpr size_t kEnd = offsetof(pkcs7, modulus_length) + sizeof(record->modulus_length);
@@ -151,8 +151,8 @@ void StoreExponent(const asn1_hdr& exponent, pkcs7* record) {
          std::min<size_t>(exponent.length, kEnd - kStart));
 }
 
-// Reads the first SignerInfo (RFC 2315 §9.2) of the signerInfos, which follow the certificates.
-// Deliberate: failures here print "PUBLIC KEY ERROR", like failures in the public key.
+// Reads the first SignerInfo (RFC 2315 §9.2). The element after the certificates is read as the
+// signerInfos. Deliberate: failures here print "PUBLIC KEY ERROR", like failures in the public key.
 bool ReadSigner(const Block& block, const asn1_hdr& certificates, pkcs7* record) {
   asn1_hdr signers, signer, version, issuer;
   if (!block.ReadInside(block.Skip(certificates), block.length, &signers) ||
@@ -168,9 +168,9 @@ bool ReadSigner(const Block& block, const asn1_hdr& certificates, pkcs7* record)
 
   // Deliberate: the two elements after the digestAlgorithm are found by position, and their tags
   // are not checked. If a SignerInfo has authenticated attributes, its digestEncryptionAlgorithm is
-  // read as the encryptedDigest, and the package is then refused. This is intended, because the
-  // real signature covers only the attributes, not the signature file itself. The bound for both
-  // elements is the distance from the start of the block to the end of the digestAlgorithm.
+  // read as the encryptedDigest, and the package is then refused. The refusal is intended: the
+  // encryptedDigest of such a SignerInfo signs the attributes, not the signature file. Each of the
+  // two elements, header included, may have at most `bound` bytes.
   const size_t bound = block.Skip(algorithm);
   asn1_hdr encryption, digest;
   if (!block.Read(bound, bound, &encryption) ||
@@ -182,8 +182,8 @@ bool ReadSigner(const Block& block, const asn1_hdr& certificates, pkcs7* record)
   return true;
 }
 
-// Reads the AlgorithmIdentifier at `offset`. It must end at or before `end`, and may name any
-// algorithm, because the tool uses the digest algorithm that the signature itself names.
+// Reads the AlgorithmIdentifier at `offset`. Fails if it does not end at or before `end`. Accepts
+// any algorithm, because the tool uses the digest algorithm that the signature's DigestInfo names.
 bool ReadDigestAlgorithm(const Block& block, size_t offset, size_t end, asn1_hdr* algorithm) {
   asn1_oid oid;
   const uint8_t* next;

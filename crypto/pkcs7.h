@@ -1,8 +1,9 @@
 // Reads the signature block of a signed JAR: the `.RSA` entry, a PKCS#7 SignedData (RFC 2315 §9).
-// Returns the values for two RSA verifications: that of the certificate's signature and that of the
-// signature file's signature. Finds the elements by their position and checks few tags. Allocates
-// nothing. The record points into the caller's block. The block must outlive the record. A failure
-// prints one or two lines "CERT_PARCER [ERROR]: ..." on standard output and logs nothing.
+// Fills in a record (struct pkcs7) with the values that are needed to verify two RSA signatures:
+// the certificate's signature and the signature file's signature. Finds the elements by their
+// position and checks few tags. Allocates nothing. The record points into the caller's block. The
+// block must outlive the record. A failure prints one or two lines "CERT_PARCER [ERROR]: ..." on
+// standard output and logs nothing.
 #pragma once
 
 #include <cstdint>

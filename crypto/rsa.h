@@ -1,9 +1,9 @@
 // RSA PKCS#1 v1.5 signature verification (RFC 8017 §8.2.2) with the integers of crypto/mpi.h.
 //
-// A context owns the limbs of its two numbers; an rsa_local releases them. No pointer to the
-// caller's bytes is kept after a call. rsa_pkcs1_verify logs a refusal, at error priority, only if
-// it refuses the DigestInfo. Exception: a DigestInfo that is as long as one for MD5, but has a
-// wrong prefix, is refused without a message.
+// An rsa_context owns the limbs of its modulus and exponent; an rsa_local releases them. No pointer
+// to the caller's bytes is kept after a call. rsa_pkcs1_verify logs a refusal, at error priority,
+// only if it refuses the DigestInfo. Exception: a DigestInfo with the length of one for MD5 is
+// refused without a message if its prefix differs from MD5's in any byte but the algorithm's.
 #pragma once
 
 #include <cstdint>
@@ -12,7 +12,7 @@
 
 // A public key.
 struct rsa_context {
-  int32_t len;  // length in bytes of the modulus as given, and of every signature
+  int32_t len;  // length in bytes of the modulus, with its leading zeros, and of every signature
   mpi N;        // the modulus
   mpi E;        // the public exponent
 };
@@ -66,9 +66,9 @@ int rsa_set_key(rsa_context* ctx, const uint8_t* modulus, const uint8_t* exponen
 //   kRsaBadInput (5)        null `ctx`, `sha1` or `sig`; `len` outside 16..512; signature not below
 //                           the modulus
 //   kRsaInvalidPadding (7)  not a block of type 1 (RFC 8017 §9.2); a DigestInfo of an unknown
-//                           length; an MD algorithm other than MD5; a SHA-256 DigestInfo, but
-//                           `sha256` is null
-//   kRsaVerifyFailed (18)   the DigestInfo's prefix or digest does not match
+//                           length; a prefix that differs from MD5's only in the algorithm's
+//                           byte; a SHA-256 DigestInfo, but `sha256` is null
+//   kRsaVerifyFailed (18)   another wrong prefix, or a wrong digest
 //   kRsaPublicFlag | kMpiNoMemory (17), kMpiBadModulus (20: the modulus is even) or
 //                           kMpiBufferTooSmall (24: the result is longer than `len` bytes)
 int rsa_pkcs1_verify(const rsa_context* ctx, const uint8_t* sha1, const uint8_t* sha256,

@@ -3,8 +3,8 @@
 
 // Marks a function whose unsigned arithmetic may wrap. The function handles carries itself, or
 // needs the wrapped value. In the builds that check for unsigned overflow (scripts/check sanitize
-// and fuzz), an overflow in a function of the tool without this mark ends the program. In all other
-// builds, the mark has no effect.
+// and fuzz), the program ends if unsigned arithmetic wraps in an unmarked function of the tool. In
+// all other builds, the mark has no effect.
 #ifdef __clang__
 #define WRAPS_ON_PURPOSE __attribute__((no_sanitize("unsigned-integer-overflow")))
 #else

@@ -5,8 +5,8 @@
 
 namespace {
 
-// The bytes of an element that are not read yet. Deliberate: bytes after the last element that the
-// parser looks for are ignored.
+// A part of the input that is still to be read. Deliberate: if an element has more bytes than the
+// parser reads, the rest of the element is ignored.
 struct Range {
   const uint8_t* start;
   size_t length;
@@ -51,9 +51,10 @@ uint32_t ToUint32(const asn1_hdr& integer) {
 
 bool HoldsNul(const asn1_hdr& hdr) { return memchr(hdr.payload, 0, hdr.length) != nullptr; }
 
-// The parts of a certificate, in order. ParseTbs, ParseVersionAndSerial, ParseOptionalFields and
-// ParseSignature return a code of x509_certificate_parse. The others return true or 0 for success,
-// and false or a negative number for failure. Their caller chooses the code.
+// The functions that read the parts of a certificate, in order. ParseTbs, ParseVersionAndSerial,
+// ParseOptionalFields and ParseSignature return a code of x509_certificate_parse. The others
+// return true or 0 for success, and false or a negative number for failure. ParseTbs,
+// ParseOptionalFields or ParseSignature then chooses the code for the failure.
 int ParseTbs(Range tbs, x509_certificate* cert);
 int ParseVersionAndSerial(Range* tbs, x509_certificate* cert);
 bool ParseAlgorithm(Range* range, asn1_oid* oid, asn1_oid* params);
@@ -338,8 +339,8 @@ bool ReadExtensionValue(Range extension, bool* critical, Range* value) {
     // Deliberate: the next header is read from the flag's value byte, not from the byte after it.
     // TRUE in DER is 0xFF. This byte reads as the first octet of a long-form tag of the private
     // class. The identifier octet of the OCTET STRING, 0x04, then reads as the tag number 4, which
-    // is the tag of an OCTET STRING. FALSE is 0x00, which reads as tag 0. An extension with a
-    // FALSE, which DER omits, is therefore refused.
+    // is the tag of an OCTET STRING. FALSE is 0x00, which reads as the tag 0, not 4. An extension
+    // with an encoded FALSE is therefore refused. DER omits this FALSE, because it is the default.
     extension = After(from_flag, hdr.payload);
     if (!Next(&extension, &hdr)) return false;
     if (hdr.class_ != kAsn1Universal && hdr.class_ != kAsn1Private) return false;
@@ -384,8 +385,9 @@ bool ParseBasicConstraints(Range value, x509_certificate* cert) {
   return true;
 }
 
-// Reads GeneralNames (RFC 5280 §4.2.1.6) without the header of the SEQUENCE. Returns 0, or -1 if a
-// header cannot be read, a text contains a NUL or a registeredID is malformed.
+// Reads GeneralNames (RFC 5280 §4.2.1.6) without the header of the SEQUENCE. Returns -1 if a header
+// cannot be read, if KeepText refuses a text, or if a registeredID is malformed. Otherwise returns
+// 0.
 int x509_parse_ext_alt_name(x509_name* name, const uint8_t* buf, size_t len) {
   Range names = {buf, len};
   while (names.length > 0) {
@@ -415,8 +417,8 @@ bool KeepAltName(const asn1_hdr& hdr, x509_name* name) {
   }
 }
 
-// Many programs read a text only up to its first NUL, so they would see a shorter text. A text with
-// a NUL is therefore refused, and the field becomes empty.
+// Stores the contents of `hdr` in `text` and `length`. For a text with a NUL, stores an empty text
+// and returns false: many programs would read this text only up to the NUL.
 bool KeepText(const asn1_hdr& hdr, const uint8_t** text, uint64_t* length) {
   const bool good = !HoldsNul(hdr);
   *text = good ? hdr.payload : nullptr;

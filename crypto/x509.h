@@ -8,8 +8,8 @@
 
 #include "crypto/asn1.h"
 
-// A UTCTime or GeneralizedTime as written. The ranges of the numbers are not checked. `year` is the
-// full year, also for a UTCTime.
+// The numbers of a UTCTime or a GeneralizedTime. Their ranges are not checked. `year` has four
+// digits, also for a UTCTime.
 struct x509_parser_time {
   uint16_t year;
   uint8_t month, day, hour, minute, second;
@@ -35,9 +35,10 @@ struct x509_name_attribute {
 
 inline constexpr size_t kX509MaxAttributes = 20;
 
-// A distinguished name, with the alternative names from the certificate's extension. A missing part
-// is a null pointer with length 0; a missing `rid` has no arcs. If there are several e-mail
-// addresses, or several alternative names of one kind, the last one is kept.
+// A distinguished name. The issuer's record also has the names of the issuerAltName extension, and
+// the subject's record has the names of the subjectAltName extension. A missing part is a null
+// pointer with length 0; a missing `rid` has no arcs. Of several emailAddress attributes, the last
+// one is kept. Of several alternative names of one kind, the last one is kept.
 struct x509_name {
   x509_name_attribute attributes[kX509MaxAttributes];  // in order of appearance
   uint64_t attribute_count;
@@ -85,21 +86,22 @@ struct x509_certificate {
   uint64_t tbs_length;
 };
 
-// Reads the certificate at the start of the `len` bytes at `buf` into `cert`. Bytes after it are
-// ignored. Returns 0, or
+// Reads the certificate at the start of the `len` bytes at `buf` into `cert`. Bytes after the
+// certificate are ignored. Returns 0, or
 //   -2   `buf` or `cert` is null, or `len` is 0
 //   -3   the Certificate or the tbsCertificate cannot be read or is not a SEQUENCE
 //   -4   the signatureValue cannot be read or is not a BIT STRING
-//   -5   a header of the version, the serialNumber or the optional fields cannot be read, the first
-//        optional field is not context-specific, or the signatureValue is empty
+//   -5   the header of the version, of the serialNumber or of the first optional field cannot be
+//        read, this optional field is not context-specific, or the signatureValue is empty
 //   -6   the signatureValue has unused bits
-//   -9   the version is not v1, v2 or v3
+//   -9   the version is not an INTEGER for v1, v2 or v3
 //   -10  the serialNumber is not an INTEGER
 //   -11  a signature's AlgorithmIdentifier is malformed
-//   -12  the issuer or the subject is malformed, or has more attributes than a record keeps
+//   -12  the issuer or the subject is malformed, or has more than kX509MaxAttributes attributes of
+//        the types that a name keeps
 //   -13  the validity is malformed
 //   -14  the subjectPublicKeyInfo is malformed
 //   -15  an extension is malformed, is critical and unknown, or is in a v2 certificate
-// After -2, `cert` is unchanged. After any other failure, it contains the fields that were read
+// After -2, `cert` is unchanged. After any other failure, `cert` contains the fields that were read
 // before the failure.
 int x509_certificate_parse(const uint8_t* buf, size_t len, x509_certificate* cert);

@@ -1,7 +1,8 @@
-// Prints whether a package's JAR signature is good, and who made it. This is an example of a
-// program that links the verification. It signs nothing. Phones from Android 7 on take the signer
-// from a newer signature (v2, v3) if the package has one. This program does not read that
-// signature. README.md in this directory shows how to compare the two signers.
+// An example of a program that links the tool's verification. Prints whether a package has a good
+// JAR signature, and the digest of the JAR signer's key. Signs nothing. If a package has a newer
+// signature (v2, v3), phones from Android 7 on take the signer from the newer signature. This
+// program does not read newer signatures. README.md in this directory shows how to compare the two
+// signers.
 #include <fcntl.h>
 #include <unistd.h>
 

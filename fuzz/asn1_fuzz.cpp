@@ -8,8 +8,8 @@
 
 namespace {
 
-// Reads the elements of the range, one after the other, and the elements inside them, down to a
-// depth of 8.
+// Reads the elements in the `size` bytes at `data`, up to the first invalid element. Reads the
+// contents of each element in the same way, down to depth 8. The outermost elements have depth 0.
 void WalkElements(const uint8_t* data, size_t size, int depth) {
   size_t position = 0;
   while (position < size) {
@@ -17,11 +17,11 @@ void WalkElements(const uint8_t* data, size_t size, int depth) {
     const int result = asn1_get_next(data + position, size - position, &header);
     Require(result == 0 || result == -1, "asn1_get_next returns 0 or -1");
     if (result != 0) {
-      Require(header.payload == nullptr, "a failed read leaves no payload");
+      Require(header.payload == nullptr, "the payload is null after a failure");
       return;
     }
     Require(LiesIn(header.payload, header.length, data + position, size - position),
-            "an element is in its range");
+            "the contents of an element are in the given bytes");
     Require(header.payload >= data + position + 2, "a header has two bytes or more");
     if (depth < 8) WalkElements(header.payload, header.length, depth + 1);
     position = static_cast<size_t>(header.payload - data) + header.length;
@@ -43,7 +43,7 @@ void ReadOid(const uint8_t* data, size_t size, size_t room) {
   const uint8_t* next = nullptr;
   if (size == 0 || asn1_get_oid(data, size, &oid, &next) != 0) return;
   Require(oid.len >= 2 && oid.len <= 20, "an object identifier element has 2 to 20 arcs");
-  Require(LiesIn(next, 0, data, size), "the next element is in the range, or at its end");
+  Require(LiesIn(next, 0, data, size), "the next element is in the given bytes, or at their end");
   CheckText(oid, room);
 }
 

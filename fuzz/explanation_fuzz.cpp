@@ -1,5 +1,6 @@
 // The simulator's own readers of a file, which explain the tool's result. The first byte of the
-// input selects one of four readers, or all of them over a whole file.
+// input selects a function of kReaders. The other bytes are the input of this function: a whole
+// file, or one part of a file.
 #include <sys/mman.h>
 #include <unistd.h>
 
@@ -50,10 +51,11 @@ void JudgeSignatureBlock(std::string_view bytes) {
 
 void JudgeAndroidManifest(std::string_view bytes) {
   const AndroidManifest manifest = ParseAndroidManifest({bytes.begin(), bytes.end()});
-  Require(!manifest.has_overlaps || !manifest.package_name, "overlapping texts are not read");
+  Require(!manifest.has_overlaps || !manifest.package_name,
+          "a manifest with overlapping strings is not read");
   // A UTF-16 unit of two bytes becomes at most three bytes of UTF-8.
   Require(manifest.installer_name.size() <= bytes.size() * 3 / 2,
-          "the installer's name fits in the document");
+          "the package's name by the installer's rules fits in the document");
 }
 
 void ReadWholeFile(std::string_view bytes) {
@@ -62,7 +64,7 @@ void ReadWholeFile(std::string_view bytes) {
           "the file is written");
   const PackageFacts facts = LookAt("/proc/self/fd/" + std::to_string(fd));
   close(fd);
-  Require(facts.error == 0 && facts.size == bytes.size(), "the file is looked at");
+  Require(facts.error == 0 && facts.size == bytes.size(), "the file is opened and has its size");
   const bool is_archive = facts.kind == FileKind::kArchive && facts.archive_result == 0;
   Require(is_archive || facts.entries.empty(), "only archives have entries");
   Require(!facts.was_changed, "the file was not changed");
@@ -70,7 +72,8 @@ void ReadWholeFile(std::string_view bytes) {
   for (const ListedEntry& each : facts.entries) libraries += kLibraryNames.Has(each.entry.name);
   Require(libraries == facts.libraries.size(), "each library is listed, damaged or not");
   const bool has_key = facts.jar.key.has_value();
-  Require(!has_key || facts.jar.key->modulus_sha256.size() == 64, "a key has its digest");
+  Require(!has_key || facts.jar.key->modulus_sha256.size() == 64,
+          "the digest of the signer's modulus has 64 digits");
 }
 
 }  // namespace

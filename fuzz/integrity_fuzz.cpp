@@ -1,5 +1,6 @@
-// sign/integrity.h: any texts in the integrity file, a new one each time that the tool opens it.
-// The last text is a settled value (not ffffffff), so that every wait ends.
+// sign/integrity.h: any texts in the integrity file. Each time the tool opens the integrity file,
+// the file has the next text. The last text is a settled value (not ffffffff), so that every wait
+// ends.
 #include "sign/integrity.h"
 
 #include <algorithm>
@@ -16,7 +17,7 @@ void CheckReading(const std::deque<std::string>& texts, uint32_t wait) {
   constexpr uint32_t kUntouched = 0x5a5a5a5a;
   uint32_t value = kUntouched;
   const uint32_t result = VeltTaskReadIntegrity(0, wait, &value);
-  Require(result == 0 || result == kVeltFailure, "the result is success or failure");
+  Require(result == 0 || result == kVeltFailure, "the result is 0 or kVeltFailure");
   Require(result != 0 || wait == 0 || value != 0xFFFFFFFF,
           "a waiting read returns a settled value");
   Require(result == 0 || wait != 0 || value == kUntouched,
@@ -41,7 +42,7 @@ void CheckSigning(const std::deque<std::string>& texts) {
       std::any_of(phone.events.begin(), phone.events.end(),
                   [](const std::string& event) { return event.rfind("sign ", 0) == 0; });
   Require(told == is_signed, "a file is signed if and only if success is reported");
-  Require(told == may_sign, "a task signs if and only if its settled value is not 0");
+  Require(told == may_sign, "a file is signed if and only if a settled value other than 0 is read");
 }
 
 }  // namespace

@@ -1,6 +1,6 @@
-// A package influences names and texts in a journal. This target does one of three things with the
-// input, as the simulator does. It escapes a text and reads it back, reads one line of the tool's
-// log, or reads the journal of a whole run. The first byte of the input selects one of the three.
+// A package influences names and texts in the journal of a run. This target calls the simulator's
+// functions for such texts. The first byte of the input selects what the rest of the input is: a
+// text to escape and read back, one line of the tool's log, or the journal of a whole run.
 #include <algorithm>
 #include <sstream>
 #include <string>
@@ -16,7 +16,7 @@ using nlohmann::json;
 
 namespace {
 
-// True if the text is not UTF-8, or has a hidden character (IsHidden) other than a line end.
+// True if the text is not UTF-8, or has a hidden character (IsHidden) other than LF.
 bool HasHidden(std::string_view text) {
   while (!text.empty()) {
     const size_t length = Utf8Length(text);
@@ -104,7 +104,7 @@ extern "C" int LLVMFuzzerTestOneInput(const uint8_t* data, size_t size) {
   constexpr void (*kReaders[])(std::string_view) = {JudgeText, JudgeLogLine, JudgeJournal};
   if (size == 0) return 0;
   const size_t which = data[0] % (sizeof(kReaders) / sizeof(kReaders[0]));
-  // An exact copy, so that reading one byte too far is detected.
+  // An exact copy, so that AddressSanitizer detects a read beyond its end.
   const std::vector<char> copy(data + 1, data + size);
   kReaders[which]({copy.data(), copy.size()});
   return 0;

@@ -103,8 +103,8 @@ void MakeSignatureBlocks() {
   }());
 }
 
-// fuzz/rsa_fuzz.cpp reads the digests and numbers from the start of the input, and its choices from
-// the end.
+// fuzz/rsa_fuzz.cpp reads the digests, the signature and the modulus from the start of the input.
+// It reads the choices backwards from the end.
 void SeedRsa(const std::string& name, Digest digest, size_t length, uint8_t length_choice) {
   const Bytes data = ToBytes("data");
   const Bytes choices = {1, 0 /* exponent 1 */, 1, length_choice, 1};
@@ -175,8 +175,10 @@ void MakeCompiledManifests() {
   Seed("compiled_manifest", "bad-node", CompiledXml().Start("manifest").BadNode().Build());
 }
 
-// The first byte selects the phone. 0: a healthy phone. 2: the file has the attribute "user.zu".
-// 16: the integrity value settles at the second reading. 128: an attacker replaces libraries.
+// `phone` is the first byte of the seed. Its bits set the phone's answers and the attacker
+// (fuzz/package_fuzz.cpp). 0: a phone without faults and no attacker. 2: each file has the
+// attribute "user.zu". 16: the integrity value settles at the second reading. 128: an attacker
+// replaces libraries.
 void SeedPackage(const std::string& name, const PackageOptions& options, uint8_t phone = 0) {
   Seed("package", name, Concat({{phone}, MakePackage(options).Build()}));
 }
@@ -201,7 +203,7 @@ void MakePackages() {
   SeedPackage("registered-jar", options, 2);
 }
 
-// The first byte selects the reader (fuzz/explanation_fuzz.cpp).
+// The first byte of the seed, `reader`, is an index in kReaders (fuzz/explanation_fuzz.cpp).
 void SeedExplanation(const std::string& name, uint8_t reader, const Bytes& content) {
   Seed("explanation", name, Concat({{reader}, content}));
 }
@@ -221,8 +223,8 @@ void MakeExplanations() {
   SeedExplanation("compiled-manifest", 4, CompiledManifest("com.example.app", true));
 }
 
-// The first byte selects what the fuzz target reads from the other bytes: a text, a line or a run
-// (fuzz/journal_fuzz.cpp).
+// The first byte of a seed selects what its other bytes are (fuzz/journal_fuzz.cpp). 0: any text.
+// 1: one line of the tool's log. 2: the journal of a run.
 void MakeJournals() {
   Seed("journal", "text", Concat({{0}, ToBytes("a\u00fc\u202e\xff\uf7ff\n")}));
   Seed("journal", "line", Concat({{1}, ToBytes("VeltSignJni: File not verified: /a\n")}));
@@ -236,8 +238,8 @@ void MakeJournals() {
 )")}));
 }
 
-// Numbers that choose the package and the events of its run (fuzz/verdict_fuzz.cpp). This package
-// has one key. It is signed, and its key is registered.
+// fuzz/verdict_fuzz.cpp makes a package and the events of its run from the bytes of the seed. With
+// these bytes, the package is signed, and its key is registered.
 void MakeVerdicts() {
   const Bytes package = {0, 1, 0, 1, 1, 0, 1, 0, 1, 0, 0, 1, 0};
   const Bytes run = {0, 0, 1, 1, 0, 1, 3, 1, 0, 1, 0, 0, 1, 2, 2, 0, 1};

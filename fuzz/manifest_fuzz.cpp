@@ -1,5 +1,5 @@
-// apk/manifest_mf.h: parses any text. A second parser (ReadManifest in fuzz/models.h) must return
-// the same result.
+// apk/manifest_mf.h: any text as a manifest. ManifestMf and a second parser (ReadManifest in
+// fuzz/models.h) must find the same sections.
 #include "apk/manifest_mf.h"
 
 #include <map>
@@ -28,8 +28,8 @@ extern "C" int LLVMFuzzerTestOneInput(const uint8_t* data, size_t size) {
   Require(valid == static_cast<bool>(manifest), "the object converts to the result of load()");
 
   const ManifestModel expected = ReadManifest(text);
-  Require(valid == expected.valid, "both readers accept the text, or both refuse it");
-  Require(SectionsOf(manifest) == expected.sections, "both readers find the same sections");
+  Require(valid == expected.valid, "both parsers accept the text, or both refuse it");
+  Require(SectionsOf(manifest) == expected.sections, "both parsers find the same sections");
 
   manifest.load(text);
   Require(SectionsOf(manifest) == expected.sections, "a second load() keeps nothing of the first");

@@ -7,7 +7,7 @@ namespace {
 
 using namespace std::string_literals;
 
-// A reader at a position in the text. Past the end, it reads NUL.
+// Reads the sections of a manifest from the text. At() returns NUL for a position past the end.
 class Reader {
  public:
   explicit Reader(const std::string& text) : text_(text) {}
@@ -28,7 +28,8 @@ class Reader {
     return false;
   }
 
-  // Returns false at the end of the text, or if the text is malformed.
+  // Appends the next section to the model. Returns false, and appends nothing, if the text is
+  // malformed or ends before the section does.
   bool ReadSection() {
     std::map<std::string, std::string> section;
     position_ = std::min(text_.find_first_not_of(" \r\n", position_), text_.size());

@@ -12,7 +12,7 @@
 
 namespace {
 
-// A number of the tool.
+// A number of the tool: an mpi that frees its limbs.
 struct Number : mpi_local {
   void Set(const std::vector<uint32_t>& limbs, int sign) {
     Require(mpi_grow(this, static_cast<int>(limbs.size())) == 0, "mpi_grow succeeds");
@@ -21,7 +21,7 @@ struct Number : mpi_local {
   }
 };
 
-// A number of GMP: a copy of a number of the tool, or a result that GMP computes.
+// A number of GMP: a copy of an mpi, or a result that GMP computes.
 class Expected {
  public:
   Expected() { mpz_init(value_); }
@@ -98,7 +98,7 @@ void AddOrSubtract(FuzzedDataProvider& input) {
     mpz_sub(expected.get(), abs_a.get(), abs_b.get());
     Require(mpi_sub_abs(x, &a, second) == 0, "mpi_sub_abs succeeds");
   }
-  RequireEqual(x, expected, "the sum or difference is that of GMP");
+  RequireEqual(x, expected, "the sum or difference equals the one that GMP computes");
   Require(x->s == 1, "the sign of the result is +1");
 }
 
@@ -143,10 +143,10 @@ void Remainder(FuzzedDataProvider& input) {
   }
   mpz_mod(expected.get(), expected.get(), divisor.get());
   Require(mpi_mod_mpi(r, &a, &b) == 0, "mpi_mod_mpi succeeds");
-  RequireEqual(r, expected, "mpi_mod_mpi divides");
+  RequireEqual(r, expected, "mpi_mod_mpi computes the same remainder as GMP");
 }
 
-// Sets `number` to the value of the limbs modulo `m`, with at least `room` limbs.
+// Sets `number` to the value of `limbs` modulo `m`. `number` then has at least `room` limbs.
 void SetBelow(Number& number, std::vector<uint32_t> limbs, Expected& m, size_t room) {
   Number whole;
   whole.Set(limbs, 1);
@@ -175,7 +175,7 @@ void MontgomeryProduct(FuzzedDataProvider& input) {
   SetBelow(b, Limbs(input, n), expected_m, input.ConsumeBool() ? n + 1 : 1);
   t.Set(std::vector<uint32_t>(2 * (n + 1), 0x5a5a5a5a), 1);
 
-  uint32_t inverse = 1;  // of the lowest limb; each step doubles the number of correct bits
+  uint32_t inverse = 1;  // of modulus[0]; each step doubles the number of correct low bits
   for (int step = 0; step < 5; ++step) inverse *= 2 - modulus[0] * inverse;
   Expected expected(&a), factor(&b), radix;
   mpz_mul(expected.get(), expected.get(), factor.get());

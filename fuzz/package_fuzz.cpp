@@ -1,8 +1,8 @@
 // Runs the whole tool, from main() on, with any bytes as the package file. The phone is simulated
 // inside this program (support/phone.h). The first byte of the input sets the phone's answers, and
 // whether an attacker exchanges libraries. The other bytes are the package file. A model
-// (package_model.h) reads the same file, and must allow every signature and registration. The peak
-// memory has a limit, and no descriptor may stay open.
+// (package_model.h) reads the same file, and must allow each signature and each registration that
+// the tool requests. The peak memory has a limit, and no descriptor may stay open.
 #include <dirent.h>
 #include <fcntl.h>
 #include <sanitizer/allocator_interface.h>
@@ -28,19 +28,20 @@
 #include "support/package.h"
 #include "support/phone.h"
 
-// The main() of sign/main.cpp, which is compiled under this name.
+// The tool's main(). For this program, sign/main.cpp is compiled with the name ToolMain for main.
 int ToolMain(int argc, char* argv[]);
 
 namespace {
 
-// The limit of a run's peak memory: kBytesPerByte for each byte of the archive and for each byte
-// that its entries declare (DeclaredBytes), plus kBytesBesides.
+// The limit of a run's peak memory: kBytesBesides, plus kBytesPerByte for each byte of the input
+// and for each byte that DeclaredBytes (package_model.h) counts.
 constexpr size_t kBytesPerByte = 16;
 constexpr size_t kBytesBesides = 1 << 20;
 
 std::vector<ZipArchiveHandle> open_archives;
 
-// The package's directory, in memory, with libraries as an installer puts them there.
+// The package's directory on a file system in memory. The libraries are in lib/arm and lib/arm64,
+// as after an installation. The file outside.so is outside the directory.
 class Installation {
  public:
   Installation() {
@@ -64,8 +65,8 @@ class Installation {
   const std::string& directory() const { return directory_; }
   std::string package() const { return directory_ + "base.apk"; }
 
-  // If `path` is one of the libraries, replaces it by another file. PutBack() restores all replaced
-  // libraries.
+  // If `path` is a library or outside.so, replaces that file by a file with other bytes. PutBack()
+  // restores all replaced files.
   void Exchange(const std::string& path) {
     const auto file = files_.find(std::filesystem::weakly_canonical(path).string());
     if (file == files_.end()) return;
@@ -89,7 +90,8 @@ Installation& TheInstallation() {
   return installation;
 }
 
-// The bytes that the measured run has allocated and not freed, and the peak of this number.
+// `held` is the number of bytes that the run has allocated and not freed. `most_held` is the peak
+// of `held`. Calls of malloc and free count only while is_measured is true.
 std::atomic<bool> is_measured;
 std::atomic<size_t> held, most_held;
 
@@ -120,7 +122,7 @@ std::string PathOf(int fd) {
   return std::filesystem::read_symlink("/proc/self/fd/" + std::to_string(fd)).string();
 }
 
-// Checks with the model that the tool is allowed to send each of its requests to the phone.
+// Checks with the model each request that the tool sends to the phone: verify, sign, register.
 class Judge {
  public:
   Judge(const Bytes& archive, const Phone& phone) : archive_(archive), phone_(phone) {}
@@ -163,7 +165,8 @@ class Judge {
       Require(model_->is_good(), "a package is registered only if it is good");
       Require(data == Hex(model_->key()), "a package registers its signer's key");
     } else {
-      Require(phone_.zu_attribute_size > 0, "only a JAR with the attribute is registered");
+      Require(phone_.zu_attribute_size > 0,
+              "a JAR is registered only if it has the attribute user.zu");
       Require(data.size() == 256, "a JAR is registered with 128 bytes");
     }
   }
@@ -181,8 +184,8 @@ class Judge {
   std::optional<PackageModel> model_;
 };
 
-// Replaces each library when the tool opens it for the second time. The second opening is between
-// the check and the signing of the library.
+// Replaces each library just before the tool opens the library's path for the second time. If the
+// library passed its check, the tool opens the path for the second time to sign the library.
 class Attacker {
  public:
   void BeforeOpen(const std::string& path) {
@@ -219,8 +222,9 @@ void RunTool(const std::string& path) {
 
 }  // namespace
 
-// The tool never closes its archive, because its process ends. The fuzz target's process continues,
-// so the target keeps the archives and closes them after each run.
+// The tool never closes its archive, because the end of its process frees the archive. The process
+// of a fuzz target runs the tool many times. This target therefore closes the archive after each
+// run.
 extern "C" {
 int32_t __real__Z13OpenArchiveFdiPKcPP10ZipArchiveb(int, const char*, ZipArchiveHandle*, bool);
 int32_t __wrap__Z13OpenArchiveFdiPKcPP10ZipArchiveb(int fd, const char* name,

@@ -31,8 +31,9 @@ struct PackageModel::Archive {
   Archive(const Archive&) = delete;
   Archive& operator=(const Archive&) = delete;
 
-  // Returns 1 if the archive has the entry, 0 if it does not or is not open, and -1 on any other
-  // error. The zip library's code for an entry that is not found is -7.
+  // Returns 1 if the archive has the entry. Returns 0 if the entry is missing or the archive is not
+  // open, and -1 if the zip library returns another error. The zip library's code for an entry that
+  // is not found is -7.
   int Find(const std::string& name, ZipEntry* entry) const {
     const int result = handle == nullptr ? -7 : FindEntry(handle, std::string_view(name), entry);
     return result == -7 ? 0 : result == 0 ? 1 : -1;
@@ -138,7 +139,7 @@ bool PackageModel::AllowsLibrary(const std::string& directory, const std::string
   for (const std::string& entry : libraries_) {
     const std::string installed = ApkTools::InstalledLibraryPath("", entry);
     if (installed.empty() || !IsListed(entry, content)) continue;
-    // The tool passes the name to the system as a C string, which ends at the first NUL.
+    // The tool passes the path to the system as a C string, which ends at the first NUL.
     const std::string target = (directory + installed).c_str();
     if (std::filesystem::weakly_canonical(target) == path) return true;
   }
@@ -168,9 +169,10 @@ size_t DeclaredBytes(const Bytes& bytes) {
     while (Next(cookie, &entry, &name) == 0) {
       // Deflate makes at most 1032 bytes from one byte.
       if (entry.uncompressed_length > uint64_t{1032} * entry.compressed_length) continue;
-      // For 40 bytes of a compiled manifest, the platform's library keeps up to 64 KiB, 1639 bytes
-      // for each byte. package_fuzz.cpp permits kBytesPerByte (16) for each byte counted here, so a
-      // weight of 128 permits 2048.
+      // The platform's library keeps up to 64 KiB of memory for 40 bytes of a compiled manifest.
+      // This is up to 1639 bytes of memory for each byte. package_fuzz.cpp permits kBytesPerByte
+      // (16) bytes of memory for each byte counted here, so a weight of 128 permits 2048 bytes of
+      // memory.
       const size_t weight = name == "AndroidManifest.xml" ? 128 : 1;
       sum += weight * entry.uncompressed_length;
     }

@@ -22,8 +22,9 @@ using Items = std::vector<ZipItem>;
 constexpr size_t kMostItems = 64;
 constexpr size_t kLongestItem = 1 << 16;
 
-// Returns at most kMostItems entries, in the order of their data. Leaves out entries that are too
-// long or cannot be extracted. Returns no entries if the archive cannot be read.
+// Returns at most kMostItems entries, sorted by the offset of their data in the archive. Leaves out
+// entries that cannot be extracted or have more than kLongestItem bytes. Returns no entries if the
+// archive cannot be read.
 Items ReadItems(const Bytes& bytes) {
   ZipArchiveHandle archive = nullptr;
   void* cookie = nullptr;
@@ -102,8 +103,10 @@ void EditText(ZipItem& item, const std::string& name, const std::string& suffix,
   item.data = ToBytes(text);
 }
 
-// At depth 1, repairs the signatures. At depth 2, also repairs the manifest's digest. From depth 3
-// on, also repairs the entries' digests. The signatures come last, because they cover the digests.
+// At depth 0, repairs nothing. At depth 1, repairs the signatures. At depth 2, also repairs the
+// manifest's digest. From depth 3 on, also repairs the entries' digests. The entries' digests are
+// repaired first, because the manifest's digest covers them. The signatures are repaired last,
+// because the signature of the signer covers the manifest's digest.
 void Repair(Items& items, unsigned depth) {
   const auto find = [&](const std::string& end) {
     return std::find_if(items.begin(), items.end(),

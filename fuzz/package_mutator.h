@@ -1,6 +1,7 @@
-// Mutates whole packages so that many of them get past the first check. Up to three changes are
-// made to the entries. In most mutations, some digests and signatures are then repaired. At the
-// end, the archive is built again. Some archives are mutated as plain bytes instead.
+// Mutates whole packages so that many of them pass the tool's first checks. Some archives are
+// mutated as plain bytes. In all others, up to three changes are made to the entries. For most of
+// these archives, the signature is then repaired, and often digests too. At the end, the archive is
+// built again.
 #pragma once
 
 #include <cstddef>

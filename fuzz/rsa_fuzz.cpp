@@ -33,8 +33,8 @@ int JudgeMd(Bytes digest_info, const Bytes& md5) {
   return algorithm == 5 ? Judge(digest_info, prefix, md5) : kBadPadding;
 }
 
-// Returns the expected result for an encoded message. The rules are those of RFC 8017 section 9.2,
-// but the padding has no minimum length.
+// Returns the expected result for an encoded message (RFC 8017 section 9.2). The padding may have
+// any length. Only DigestInfos for MD5, SHA-1 and SHA-256 are accepted.
 int JudgeMessage(const Case& c, const Bytes& message) {
   if (message[0] != 0 || message[1] != 1) return kBadPadding;
   const auto separator =
@@ -101,7 +101,7 @@ extern "C" int LLVMFuzzerTestOneInput(const uint8_t* data, size_t size) {
   for (int round = 0; round < 2; ++round) {
     Require(rsa_pkcs1_verify(&context, c.sha1.data(), sha256, c.md5.data(), c.signature.data()) ==
                 ExpectedAnswer(c),
-            "the result is the model's");
+            "rsa_pkcs1_verify returns the expected result");
   }
   return 0;
 }

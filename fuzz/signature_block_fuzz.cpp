@@ -1,6 +1,6 @@
 // crypto/pkcs7.h and ApkTools::Apk::VerifyCertificate: any bytes as the signature block of one
-// fixed signature file. About half of the mutations are signed again (SignAgain), so that the
-// signature checks do not stop them.
+// fixed signature file. SignAgain gets about half of the mutated blocks. It writes good signatures
+// into a block if it can, so that mutations elsewhere in the block get past the signature checks.
 #include <cstring>
 #include <random>
 

@@ -18,7 +18,8 @@ namespace {
 
 using Context = std::unique_ptr<BN_CTX, void (*)(BN_CTX*)>;
 
-// The private exponent for a public exponent of the fuzz key; null if no such exponent exists.
+// The private exponent of the fuzz key for the magnitude of `exponent`, read as signed. Null if the
+// magnitude has no inverse.
 Bignum PrivateExponent(uint32_t exponent) {
   const RSA* const key = TestRsaKey(kFuzzKey);
   const Context context(BN_CTX_new(), BN_CTX_free);
@@ -42,8 +43,8 @@ Bytes Sign(const Bytes& data, const BIGNUM* private_exponent, size_t size) {
   return signature;
 }
 
-// Copies `piece` to `place`, a position in the block. Returns false if the piece does not fit
-// there.
+// Copies `piece` into `block` at `place`. Returns false, and copies nothing, if a part of the copy
+// would be outside the block.
 bool Put(const Bytes& piece, const uint8_t* place, Bytes& block) {
   if (!LiesIn(place, piece.size(), block.data(), block.size())) return false;
   std::copy(piece.begin(), piece.end(), block.begin() + (place - block.data()));

@@ -1,7 +1,8 @@
-// Invents a package and a run of the tool on it. Compares the simulator's verdict with the answers
-// that the kernel gave in this run. If the verdict says that the kernel got a key, the kernel must
-// have got this key. The report must not have more signed items than the kernel signed. The verdict
-// must not be a success if anything failed. The shown text must agree with the verdict.
+// Invents a package and a run of the tool on it. Compares the simulator's report with the answers
+// of the kernel and of libzu in this run. If the report says that the kernel got a key, the kernel
+// must have got this key. The report must not have more signed items than the kernel signed. The
+// verdict must not be a success if a signing, a registration or the tool failed. The shown text
+// must agree with the report.
 #include <algorithm>
 #include <sstream>
 #include <string>
@@ -48,7 +49,7 @@ class Input {
 // The journal of a run, and the facts with which the functions below compare the verdict.
 struct Run {
   std::string journal = Event("start").Text("file", "base.apk").Text("path", kPaths[0]).Line();
-  std::vector<std::string> granted;  // the payloads of what the kernel signed
+  std::vector<std::string> granted;  // the payload of each successful signing
   std::vector<std::string> registered;
   bool has_failure = false;  // of a signing, of a registration, or of the tool itself
 };
@@ -192,23 +193,24 @@ void JudgeItems(const Run& run, const Report& report) {
     if (item.kind != ItemKind::kKey) ++done;
     const auto& names = run.registered;
     const bool is_registered = std::find(names.begin(), names.end(), item.name) != names.end();
-    Require(item.kind != ItemKind::kKey || is_registered, "libzu accepted each key that is done");
+    Require(item.kind != ItemKind::kKey || is_registered,
+            "if a key item is done, libzu registered the key");
   }
   Require(done <= run.granted.size(), "the report has no more signed items than the kernel signed");
 }
 
 void JudgeVerdict(const Run& run, const PackageFacts& facts, const Report& report) {
   const bool is_good = StatusOf(report.verdict) == kAllSigned;
-  Require(!is_good || !run.granted.empty(), "after a good verdict, the kernel signed something");
+  Require(!is_good || !run.granted.empty(), "the kernel signed something if the verdict is good");
   Require(!is_good || !run.has_failure, "after a failure, the verdict is not good");
   const bool is_refused =
       std::any_of(report.items.begin(), report.items.end(),
                   [](const Item& item) { return item.state == ItemState::kRefused; });
   Require(!is_good || !is_refused, "with a refused item, the verdict is not good");
   Require(!is_good || report.items[0].state == ItemState::kDone,
-          "after a good verdict, the file itself was signed");
+          "the file itself was signed if the verdict is good");
   Require(report.verdict == Verdict::kNotSimulated || !facts.was_changed,
-          "a changed file is not simulated");
+          "if the file became shorter, the verdict is NOT SIMULATED");
 }
 
 // The printed text and the verdict event must agree with the report.

@@ -1,5 +1,5 @@
-// crypto/x509.h: any bytes as a certificate. If the platform's libcrypto reads the certificate as
-// well, both must find the same signed bytes, public key and signature.
+// crypto/x509.h: any bytes as a certificate. If x509_certificate_parse and the platform's libcrypto
+// can both read the certificate, they must find the same signed bytes, public key and signature.
 #include "crypto/x509.h"
 
 #include <openssl/mem.h>
@@ -20,12 +20,12 @@ void CheckName(const x509_name& name, const uint8_t* data, size_t size) {
   Require(name.attribute_count <= 20, "a name has at most 20 attributes");
   for (uint64_t i = 0; i < name.attribute_count; ++i) {
     const x509_name_attribute& attribute = name.attributes[i];
-    Require(attribute.type >= 1 && attribute.type <= 8, "an attribute is of a known kind");
+    Require(attribute.type >= 1 && attribute.type <= 8, "an attribute has a known type");
     Require(LiesIn(attribute.value, attribute.value_length, data, size),
             "an attribute's value is in the input");
     Require(attribute.value_length == 0 ||
                 memchr(attribute.value, 0, attribute.value_length) == nullptr,
-            "no NUL in a name");
+            "an attribute's value contains no NUL");
   }
   Require(LiesIn(name.email, name.email_length, data, size), "the email is in the input");
   Require(LiesIn(name.alt_email, name.alt_email_length, data, size),

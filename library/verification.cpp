@@ -15,11 +15,11 @@ namespace ApkTools {
 
 namespace {
 
-// The starts of the lines that the tool's code logs for a refusal, and the reason that each line
-// gives. A refusal logs lines of at most one row, and can log the same line twice. The exception is
-// a manifest that does not parse. The parser then logs "Parse manifest: ", as for a signature file,
-// and its caller logs "Can't load manifest: ". The line that was logged last therefore gives the
-// reason.
+// The start of each line that the tool's code logs for a refusal, and the reason that the line
+// gives. If the manifest does not parse, two of these lines are logged. First the parser logs
+// "Parse manifest: ", as for a signature file. Then its caller logs "Can't load manifest: ". For
+// any other refusal, at most one of these lines is logged, possibly twice. The line that was logged
+// last therefore gives the reason.
 constexpr struct LoggedReason {
   const char* start;
   Reason reason;
@@ -151,9 +151,9 @@ void Hear(std::string_view text) {
 
 }  // namespace ApkTools
 
-// This definition replaces the platform's in the whole program, also for calls from the platform's
-// libraries. A text that is too long for a log record is cut at kLogTextSize, as the platform's
-// function cuts it.
+// This definition replaces the platform's function in the whole program, also for calls from the
+// platform's libraries. As in the platform's function, a text is cut to at most kLogTextSize bytes,
+// including the closing NUL.
 extern "C" int __android_log_print(int priority, const char* tag, const char* format, ...) {
   va_list arguments;
   va_start(arguments, format);

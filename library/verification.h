@@ -41,8 +41,8 @@ enum class Reason {
 // The reason as the end of a sentence such as "refused: …", in English. The text is static.
 const char* TextOf(Reason reason);
 
-// A package that was opened and verified. The destructor releases the archive, with its mapping and
-// its memory.
+// The verification of one file. The constructor opens and verifies the package. The destructor
+// releases the archive, with its mapping and its memory.
 class Verification {
  public:
   // `fd`: the file, open for reading. The caller keeps it open for the life of the object, and

@@ -55,7 +55,8 @@ uint32_t VeltTaskReadIntegrity(int pid, uint32_t wait, uint32_t* value) {
   if (value == nullptr || !FormatIntegrityPath(pid, path)) return kVeltFailure;
   const bool waits = (wait & 1) != 0;
   // Deliberate: the number of repetitions has no limit. The kernel settles the value of every task
-  // at some time. A limit that ends the wait earlier would leave the file unsigned permanently.
+  // at some time. If a limit ended the wait before that time, VeltSignFd would fail, and the file
+  // would stay unsigned.
   while (ReadHexadecimal(path, value)) {
     if (!waits || *value != kNotSettled) return 0;
     usleep(kPollMicroseconds);

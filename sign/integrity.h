@@ -15,7 +15,7 @@ extern "C" {
 // Asks the kernel to sign the open file `fd`.
 //
 // `payload` is an unsigned 16-bit length L in host byte order, then L bytes. L may be 0. The
-// function keeps no pointer to `payload`. It fails without a request to the kernel if `payload` is
+// function keeps no pointer to `payload`. The function fails without the fcntl call if `payload` is
 // null, or if the integrity value of the calling task cannot be read or is 0. A task with the value
 // 0 must not sign. While the value is 0xFFFFFFFF (not settled yet), the function waits, without a
 // limit. If the kernel refuses, errno is the kernel's error number.

@@ -72,9 +72,9 @@ std::vector<uint8_t> JarKeyBlock(const std::string& path) {
   return block;
 }
 
-// Logs an error if the path of `fd` cannot be found. Deliberate: the registration does not need
-// this path, so it continues. The text says "oat" for packages and JARs alike. Programs that parse
-// the log match on it.
+// Logs an error if the path of `fd` cannot be found. Deliberate: the registration then continues,
+// because it does not need this path. The log text says "oat" for packages and JARs alike. Programs
+// that parse the log match on this text.
 void ReportMissingLocation(int fd) {
   if (GetFilenameByFd(fd).empty()) LogError("Can't get oat location from fd=%d\n", fd);
 }

@@ -1,11 +1,11 @@
-// Registration of the signer with the process-authentication service.
+// Registration of a package's signer, or of a plain JAR, with the process-authentication service.
 #pragma once
 
 #include "apk/apk.h"
 
 // If the file asks for a registration, calls ZuNewCertificate of libzu for `fd`. Exception: if the
 // package did not verify, or the JAR's path cannot be found, only logs an error. If the file does
-// not ask, does nothing and logs nothing. Both descriptors stay open. Only the log reports the
+// not ask, does nothing and logs nothing. `zip_fd` and `fd` stay open. Only the log reports the
 // result.
 //
 // A package asks in its AndroidManifest.xml (Apk::IsSsPermissionRequired). The signer's key is

@@ -60,8 +60,7 @@ uint32_t VeltSignJni(ApkTools::Apk& apk, int fd, const char* /*path*/) {
 
 namespace {
 
-// Signs `fd`, which is the file of `apk` or one of its libraries. If `apk` is a package, the
-// payload is that of a package. Otherwise it is that of a plain JAR.
+// Signs `fd`, which is the file of `apk` or an extracted library of `apk`.
 uint32_t VeltSignOat(ApkTools::Apk& apk, int fd) {
   return apk.IsApk() ? SignAsPackage(apk, fd) : SignAsJar(apk, fd);
 }
@@ -83,13 +82,13 @@ uint32_t SignAsPackage(ApkTools::Apk& apk, int fd) {
 
 uint32_t SignAsJar(ApkTools::Apk& apk, int fd) {
   LogInfo("VeltSignOat: non-Apk (Jar) case\n");
-  // Deliberate: the kernel must already trust the file that was opened as the archive. It need not
-  // trust `fd`.
+  // Deliberate: the kernel must already trust the file that was opened as the archive. The kernel
+  // need not trust `fd`.
   uint32_t result = VeltVerifyFd(apk.GetFd());
   if (result != 0) {
     const int error = errno;
-    // Deliberate: this is logged as information, not as an error. Most JARs on a device were never
-    // signed, so an untrusted JAR is the ordinary case.
+    // Deliberate: an untrusted JAR is logged as information, not as an error. Most JARs on a device
+    // were never signed, so an untrusted JAR is the ordinary case.
     LogInfo("VELT can't verify a file %d: %s/%s.\n", error, apk.GetPackageName().c_str(),
             strerror(error));
     return result;
@@ -113,12 +112,15 @@ std::vector<uint8_t> SignPayload(const std::vector<uint8_t>& data) {
   return payload;
 }
 
-// Signs the extracted library `target` if its bytes match the digest of the entry in the signed
-// manifest. Returns false if they could not be verified; the caller then logs the refusal.
-// Otherwise returns true. Logs every other failure itself.
+// Signs the extracted library `target` if its bytes match the digest of `entry_name` in the signed
+// manifest. Returns false if these bytes could not be verified. The caller then logs the refusal.
+// Otherwise returns true, even if the library was not signed. In that case, the failure is already
+// logged.
 bool SignLibrary(ApkTools::Apk& apk, const std::string& entry_name, const std::string& target) {
-  // The digested file stays open, so that no other file can get its inode number meanwhile. Its
-  // descriptor has a high number, so that the file to sign gets the lowest free descriptor.
+  // The digested file stays open until this function returns. Otherwise, after its deletion, a new
+  // file could get its inode number. IsSameFile could then mistake the new file for the digested
+  // file. The descriptor `kept` has a high number, so that the file to sign gets the lowest free
+  // descriptor.
   constexpr int kFarDescriptor = 100;
   const ScopedFd kept(fcntl(ScopedFd(OpenForReading(target.c_str(), O_CLOEXEC)).get(),
                             F_DUPFD_CLOEXEC, kFarDescriptor));
@@ -135,8 +137,9 @@ bool SignLibrary(ApkTools::Apk& apk, const std::string& entry_name, const std::s
   }
   // Deliberate: a file is signed only if fstat still returns the state that the file had before its
   // bytes were digested. An entry's name may lead into a directory that other programs can write
-  // to, so `target` may now be another file. An exchanged or touched file is digested again, this
-  // time through the descriptor that is signed (docs/decisions/the-file-that-was-read.md).
+  // to, so `target` may now be another file. A replaced or touched file is digested again, now
+  // through `library`, the descriptor to sign (docs/decisions/the-file-that-was-read.md). A library
+  // is digested at most kMostDigests times.
   constexpr int kMostDigests = 3;
   struct stat opened = {};
   fstat(library.get(), &opened);

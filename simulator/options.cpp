@@ -68,7 +68,7 @@ std::optional<int> ParseOptions(int argc, char** argv, Options* options) {
   CLI::App app(kDescription, "apktoolkit-sim");
   app.footer(kFooter);
   app.get_formatter()->column_width(28);
-  app.allow_extras();  // NameUnknownOption reports them
+  app.allow_extras();  // NameUnknownOption reports unknown options
   options->installer.program = ProgramDirectory() + "/../share/apktoolkit/installer.jar";
   std::string runner;
 
@@ -121,7 +121,7 @@ std::optional<int> ParseOptions(int argc, char** argv, Options* options) {
 namespace {
 
 // The command line in reverse order, as CLI11 expects it. An --install without a value gets the
-// default value, because CLI11 would use the next word, a file, as its value.
+// default value. Otherwise CLI11 would use the next word, for example a file, as the value.
 std::vector<std::string> CommandLineOf(int argc, char** argv) {
   std::vector<std::string> words(argv + std::min(argc, 1), argv + argc);
   const auto end_of_options = std::find(words.begin(), words.end(), "--");
@@ -324,8 +324,8 @@ void AddRun(CLI::App* app, Options* options, std::string* runner) {
       ->take_last();
 }
 
-// With --verify, nothing is signed and there are no verdicts. The options below have no meaning
-// then.
+// With --verify, nothing is signed and there are no verdicts. --verify therefore excludes the
+// options about verdicts. It also excludes --recursive.
 void AddVerify(CLI::App* app, Options* options) {
   CLI::Option* const verify = app->add_flag("--verify", options->verify,
                                             "Sign nothing. Run the apktoolkit-verify beside\n"

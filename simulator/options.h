@@ -25,7 +25,8 @@ struct Options {
 };
 
 // Fills `options` from the command line. Returns the exit status if the program must end: after
-// `--help` or `--version`, or after an error, which is already printed. Otherwise returns none.
+// `--help`, after `--version`, or after an error. The text for the user is then already printed.
+// Otherwise returns no value.
 std::optional<int> ParseOptions(int argc, char** argv, Options* options);
 
 }  // namespace simulator

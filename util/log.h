@@ -1,6 +1,6 @@
-// The tool writes to the Android log only through these functions. Every line has the tag
-// "ApkToolkit" and one of two priorities. The printf attribute lets the compiler check each message
-// against its arguments. The functions allocate nothing and preserve errno.
+// The tool writes to the Android log only through LogInfo and LogError. Every record has the tag
+// "ApkToolkit". The printf attribute lets the compiler check each message against its arguments.
+// The functions allocate nothing and preserve errno.
 #pragma once
 
 #include <android/log.h>
@@ -11,7 +11,7 @@
 
 inline constexpr char kLogTag[] = "ApkToolkit";
 
-// The log keeps at most this many bytes of a record's text, including the closing NUL. It cuts
+// The log keeps at most this many bytes of a record's text, including the closing NUL. LogText cuts
 // longer texts.
 inline constexpr size_t kLogTextSize = 1024;
 

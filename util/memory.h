@@ -3,8 +3,8 @@
 
 #include <cstddef>
 
-// True if a vector can grow to `size` bytes. A vector that cannot grow ends the process, so the
-// caller checks here first. Sparse files and zip bombs can declare any size. A kernel that
+// Estimates whether a vector can grow to `size` bytes. A vector that cannot grow ends the process,
+// so the caller checks here first. Sparse files and zip bombs can declare any size. A kernel that
 // overcommits grants any size and ends the process later. The function therefore returns false if
 // `size` is not below the machine's memory. A trial mapping also checks the address space.
 bool FitsInMemory(size_t size);

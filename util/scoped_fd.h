@@ -1,4 +1,4 @@
-// A file descriptor that is closed when its scope ends.
+// Owns a file descriptor, and closes it when the object is destroyed.
 #pragma once
 
 #include <unistd.h>

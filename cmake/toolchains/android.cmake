@@ -1,8 +1,8 @@
 # Builds for 64-bit Arm and API level 27, with any clang, with lld, and with your own sysroot. The
-# sysroot (-DCMAKE_SYSROOT=DIR) has the target's C and C++ libraries. -DPLATFORM_INCLUDE_DIR and
-# -DPLATFORM_LIBRARY_DIR name the platform libraries (docs/porting.md).
+# sysroot (-DCMAKE_SYSROOT=DIR) must have the target's C and C++ headers and libraries.
+# -DPLATFORM_INCLUDE_DIR and -DPLATFORM_LIBRARY_DIR name the platform libraries (docs/porting.md).
 #
-# The system is called Linux, because CMake's own support for Android requires an NDK.
+# CMAKE_SYSTEM_NAME is Linux, because CMake requires an NDK if the name is Android.
 set(CMAKE_SYSTEM_NAME Linux)
 set(CMAKE_SYSTEM_PROCESSOR aarch64)
 

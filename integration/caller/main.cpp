@@ -1,11 +1,11 @@
 // apktoolkit-all DIRECTORY LIST: signs the installed packages after an update of the system. The
-// file LIST has a line "DIGEST[,DIGEST]... PATH" for each file of each package. The digests name
-// the signers that the package manager knows (SignerDigests.java). DIRECTORY contains apktoolkit,
-// apktoolkit-bound and apktoolkit-verify, for example /system/bin. The program prints the outcome
-// for each file in LIST.
+// file LIST has a line "DIGEST[,DIGEST]... PATH" for each file of each package. The digests are
+// those of the signers that the package manager knows (integration/signers/SignerDigests.java). A
+// line without digests starts with the blank. DIRECTORY contains apktoolkit, apktoolkit-bound and
+// apktoolkit-verify, for example /system/bin. The program prints the outcome for each file in LIST.
 //
-// apktoolkit is not run for files that the kernel already trusts. An interrupted run can therefore
-// be started again.
+// apktoolkit is not run for files that the kernel already trusts. After an interruption, the
+// program can therefore be started again with the same LIST.
 // Exit status: 0 if all files are trusted, 1 if some are not, 2 if the command line is wrong,
 // the list cannot be opened or read to its end, or one of its lines is malformed.
 #include <algorithm>
@@ -35,8 +35,8 @@ bool ReadLine(FILE* list, std::string* line) {
   return length > 0;
 }
 
-// The part before the first blank, the digests, may be empty. The path is absolute and may contain
-// blanks.
+// Splits the line at its first blank into digests and path. The digests may be empty. Returns false
+// if the path is not absolute. The path may contain blanks.
 bool Parse(const std::string& line, InstalledPackage* package) {
   const size_t blank = line.find(' ');
   if (blank == std::string::npos || line.compare(blank, 2, " /") != 0) return false;

@@ -13,7 +13,7 @@
 namespace {
 
 // The exit status of a child that could not set its memory limit or exec the program. The tool,
-// apktoolkit-verify and apktoolkit-bound use lower numbers.
+// apktoolkit-verify and apktoolkit-bound end with lower statuses.
 constexpr int kCannotBecome = 127;
 
 // Everything that the child needs. It is made before the fork, because the child must not allocate
@@ -21,7 +21,7 @@ constexpr int kCannotBecome = 127;
 // lock in the child.
 struct Child {
   std::vector<char*> arguments;  // ends with a null pointer
-  int null;                      // /dev/null, at a number above the standard streams
+  int null;                      // /dev/null, with a descriptor above those of the standard streams
   int descriptors;               // the child closes each descriptor from 3 to this number - 1
   rlim_t memory_bytes;
 };
@@ -59,9 +59,9 @@ std::vector<char*> Arguments(const std::vector<std::string>& command) {
   return arguments;
 }
 
-// Opens /dev/null with a number above the standard streams, even if this process has no standard
-// streams. If the descriptor had the number of a stream, dup2 would do nothing, and exec would
-// close the stream.
+// Opens /dev/null with a descriptor above those of the standard streams, even if this process has
+// no standard streams. If `null` were the descriptor of a stream, dup2 would leave this descriptor
+// close-on-exec. exec would then close the stream.
 int OpenNull() {
   const int first = open("/dev/null", O_RDWR | O_CLOEXEC);
   if (first < 0) return first;

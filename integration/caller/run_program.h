@@ -7,7 +7,8 @@
 #include <string>
 #include <vector>
 
-// In bytes. A build may set another value: with AddressSanitizer, programs need more.
+// The default of RunLimits::memory_bytes. A build may set another value: with AddressSanitizer,
+// programs need more memory.
 #ifndef APKTOOLKIT_MEMORY_LIMIT
 #define APKTOOLKIT_MEMORY_LIMIT (size_t{1} << 30)
 #endif
@@ -16,10 +17,11 @@ struct RunLimits {
   // The program is killed after this time. A package of 100 MB takes a phone some seconds. The tool
   // waits forever if its integrity value (/proc/self/integrity/value) stays ffffffff.
   int milliseconds = 120000;
-  // The limit of the memory that the program can write to (RLIMIT_DATA); 0: this process's limit.
-  // The tool needs up to 16 bytes for each byte of the file and of its entries' contents, and up to
-  // 2 KiB for each byte of AndroidManifest.xml. It aborts if it cannot get this memory. RLIMIT_AS
-  // is not used, because allocators of newer releases reserve far more addresses than they use.
+  // The limit, in bytes, of the memory that the program can write to (RLIMIT_DATA). If 0, the
+  // program has this process's limit. The tool needs up to 16 bytes for each byte of the file and
+  // of its entries' contents, and up to 2 KiB for each byte of AndroidManifest.xml. It aborts if it
+  // cannot get this memory. RLIMIT_AS is not used, because allocators of newer Android releases
+  // reserve far more addresses than they use.
   size_t memory_bytes = APKTOOLKIT_MEMORY_LIMIT;
 };
 
@@ -28,7 +30,8 @@ enum class RunEnd {
   kKilled,      // by the signal `value`; if memory runs out, the tool aborts (SIGABRT)
   kTimedOut,    // and then killed
   kNotStarted,  // `value` is the errno, or 0 if the child could not start the program
-  kLost,        // another thread of this process waited for the child
+  kLost,        // another thread of this process waited for the child, or SIGCHLD is ignored;
+                // `value` is the errno
 };
 
 struct RunResult {

@@ -4,7 +4,8 @@
 
 namespace {
 
-// Statuses of apktoolkit-bound. Any other status is apktoolkit's.
+// Exit statuses with which apktoolkit-bound ends if it does not run apktoolkit. apktoolkit itself
+// ends with 0 or 1.
 constexpr int kStatusOtherSigner = 3;
 constexpr int kStatusNoJarSigner = 4;
 constexpr int kStatusNotStarted = 5;
@@ -48,7 +49,7 @@ SignOutcome SignPackage(const std::string& directory, const InstalledPackage& pa
   const RunResult run = RunProgram({directory + "/apktoolkit-bound", package.signer_digests,
                                     directory + "/apktoolkit", package.path},
                                    limits);
-  // The tool's exit status does not show whether the file was signed. Only the kernel knows.
+  // apktoolkit's exit status does not show whether the package was signed. Only the kernel knows.
   if (IsTrusted(directory, package.path, limits)) return SignOutcome::kTrusted;
   return WhyNotTrusted(run);
 }

@@ -1,14 +1,15 @@
-// An installer calls this code to sign an installed package. The code checks the signers, runs
-// apktoolkit, and asks the kernel for the result. It keeps no state and logs nothing. Any thread
-// may call it.
+// An installer calls SignPackage to sign an installed package. If the kernel already trusts the
+// package, nothing is signed. Otherwise apktoolkit-bound checks the signers and runs apktoolkit.
+// SignPackage then asks the kernel for the result. SignPackage keeps no state and logs nothing. Any
+// thread may call it.
 //
 // Call SignPackage during an install when the package has its final path and its native libraries
-// are beside it. It must be called before any code of the package is run, mapped, or compiled ahead
-// of time (dexopt). From the start of the call on, nobody may write to the package or to files
-// beside it. The caller must not hold a lock: the call runs up to three programs in turn, and each
-// run can take the whole time limit. After an update of the system, the kernel can refuse to trust
-// files that it signed before. SignPackage must therefore be called again for every installed
-// package (main.cpp).
+// are beside it. The call must come before any code of the package is run, mapped, or compiled
+// ahead of time (dexopt). From the start of the call on, nobody may write to the package or to
+// files beside it. The caller must not hold a lock: the call starts up to three programs in turn,
+// and each of them can take the whole time limit. After an update of the system, the kernel can
+// refuse to trust files that it signed before. SignPackage must therefore be called again for every
+// installed package (main.cpp).
 #pragma once
 
 #include <string>
@@ -29,18 +30,18 @@ enum class SignOutcome {
   kNoJarSigner,  // the package has no good JAR signature; apktoolkit was not run
   kNotTrusted,   // any other reason; if apktoolkit refused the package, see its log
   kTimedOut,     // apktoolkit or apktoolkit-bound was killed at the time limit
-  kOutOfMemory,  // apktoolkit or apktoolkit-bound aborted, as it does at the memory limit
+  kOutOfMemory,  // apktoolkit or apktoolkit-bound aborted, as both do at the memory limit
   kCannotBeRun,  // apktoolkit or apktoolkit-bound is missing or cannot be started
 };
 
 // Runs the programs apktoolkit-verify, apktoolkit-bound and apktoolkit in `directory`
 // ("/system/bin").
 //
-// The caller decides how to react. It should treat an untrusted package like a package for which
-// the kernel has no payload (the digest of the signer's key). After kTimedOut and kOutOfMemory,
-// some libraries can be signed already, because apktoolkit signs them first. The package itself is
-// not trusted: if it were, the result would be kTrusted. Do not try again at once: the same file
-// needs the same time and memory.
+// The caller decides how to react. The caller should treat an untrusted package like a package for
+// which the kernel has no payload (the digest of the signer's key). After kTimedOut and
+// kOutOfMemory, some libraries can be signed already, because apktoolkit signs the libraries before
+// the package. The last run of apktoolkit-verify did not report that the package itself is
+// trusted. Do not try again at once: the same file needs the same time and memory.
 SignOutcome SignPackage(const std::string& directory, const InstalledPackage& package,
                         const RunLimits& limits);
 

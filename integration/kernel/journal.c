@@ -71,9 +71,9 @@ void journal_integrity(struct file *value, const char *text)
 	const char *quote = text ? "\"" : "";
 	int pid = 0;
 
-	/* In the line, pid 0 is the reading task itself. /proc/self is a link to the task's
-	 * /proc/PID, so the module cannot know which of the two paths the task used. The simulator
-	 * writes 0 only for /proc/self. */
+	/* The line has pid 0 if a task opens its own integrity file. The path that the kernel
+	 * resolved is the same for /proc/self and for the task's own /proc/PID, so the module
+	 * cannot distinguish them. The simulator writes 0 only for /proc/self. */
 	if (kstrtoint(task, 10, &pid) || pid == task_tgid_vnr(current))
 		pid = 0;
 	write_line("{\"event\":\"integrity\",\"pid\":%d,\"text\":%s%s%s}\n", pid, quote,

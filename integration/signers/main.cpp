@@ -1,15 +1,15 @@
 // apktoolkit-bound DIGESTS COMMAND... FILE: runs `COMMAND... FILE` if the JAR signer of the package
-// FILE is one of the signers that the package manager knows for this package. Otherwise this
-// program ends with one of its own exit statuses.
+// FILE is one of the signers that the package manager knows for this package. In all other cases,
+// and if COMMAND cannot be started, this program ends with one of its own exit statuses.
 //
-// The package manager uses the APK signing block (v2 or later) of a package that has one.
-// apktoolkit always uses the JAR signature. No other program on the phone compares the signers of
-// these two signatures (docs/threat-model.md, "Before you ship it"). DIGESTS comes from
-// SignerDigests.java: for each RSA signer that the package manager knows, the SHA-256 digest of the
-// modulus, in lower-case hexadecimal, separated by commas. This program finds the JAR signer with
-// the tool's own code, so it finds the same signer as the tool. It is a separate program, and not a
-// part of the program that calls it, for two reasons. The tool's code ends the process if memory
-// runs out, and does not free all of its memory.
+// Of a package's signature schemes, the package manager uses the newest one that it knows. This can
+// be a scheme of the APK signing block (v2 or later). apktoolkit always uses the JAR signature.
+// Neither the package manager nor apktoolkit compares the two signers (docs/threat-model.md,
+// "Before you ship it"). DIGESTS comes from SignerDigests.java: for each RSA signer that the
+// package manager knows, the SHA-256 digest of the modulus, in lower-case hexadecimal, separated by
+// commas. This program finds the JAR signer with the tool's own code, so it finds the same signer
+// as the tool. This program is separate from its caller for two reasons. The tool's code ends the
+// process if memory runs out. The tool's code also does not free all of its memory.
 #include <fcntl.h>
 #include <unistd.h>
 
@@ -27,15 +27,18 @@
 
 namespace {
 
-// The command, apktoolkit, ends with 0 or 1, so these are other numbers.
+// The exit statuses of this program. The command, apktoolkit, ends with 0 or 1, so this program
+// uses other numbers.
 constexpr int kUsageError = 2;
 constexpr int kOtherSigner = 3;
 constexpr int kNoJarSigner = 4;
 constexpr int kNotStarted = 5;
 
 // Returns the digest of the signer's key. The tool passes the same digest to the kernel. Returns an
-// empty text if the file cannot be opened, is not a package, or has no signature file with a good
-// signature. The digests in the signature file and the manifest are not considered.
+// empty text if the file cannot be opened, is not a package, or has no readable
+// META-INF/MANIFEST.MF. Also returns an empty text if the signature of the first signature file is
+// missing or does not verify. Does not check the digests that the signature file and the manifest
+// contain.
 std::string JarSigner(const char* file) {
   const ScopedFd fd(OpenForReading(file, O_CLOEXEC));
   if (fd.get() < 0) return {};
@@ -52,7 +55,7 @@ std::string JarSigner(const char* file) {
   return digits;
 }
 
-// True if `wanted` is one of the comma-separated words.
+// True if `wanted` is one of the comma-separated parts of `words`.
 bool IsAmong(std::string_view words, std::string_view wanted) {
   while (true) {
     const size_t comma = words.find(',');

@@ -30,8 +30,8 @@ import java.util.SortedSet;
 import java.util.TreeSet;
 
 public final class InstallerVerifier {
-    // The levels at which the rules change. The platform reads v3 from 28 on, requires v2 from 30
-    // on if the app targets 30 or later, and reads v3.1 from 33 on.
+    // The levels at which the rules change. The platform reads v3 from 28 on, requires v2 or later
+    // from 30 on if the app targets 30 or later, and reads v3.1 from 33 on.
     private static final int KNOWS_V3 = 28;
     private static final int ASKS_FOR_V2 = 30;
     private static final int KNOWS_V31 = 33;
@@ -86,11 +86,11 @@ public final class InstallerVerifier {
         }
     }
 
-    // The verifier answers for all levels of a range at once, and names one signer for all of them.
-    // For a package with v3 or v3.1, the levels are therefore split where the scheme begins, and
-    // where the levels of one of its signers begin or end. For other packages, all levels are at
-    // first one range. If a range is refused, the levels are also split at NEW_RULES, and all
-    // ranges are verified again.
+    // The verifier gives one answer for all levels of a range. A package with v3 or v3.1 can have
+    // different signers for different levels. Its levels are therefore split where each of these
+    // schemes begins, and where the levels of a signer begin or end. For other packages, all levels
+    // are at first one range. If a range is refused, the levels are also split at NEW_RULES, and
+    // all ranges are verified again.
     private static String ranges(DataSource source, int first, int last) throws Exception {
         SortedSet<Integer> starts = new TreeSet<>();
         boolean hasNewer = NewerSigners.read(source, starts);
@@ -171,11 +171,12 @@ public final class InstallerVerifier {
         }
     }
 
-    // Returns the verifier's answer for these levels. Phones of API 30 and later require v2 if the
-    // app targets 30 or later. The verifier checks this only if the range ends at the app's target
-    // level or later. If the package has neither v3 nor v3.1, a range that ends at 30 or later is
-    // therefore verified without an upper end. This changes no other answer. With v3 or v3.1 it
-    // could change other answers, because a signer of these schemes can be for some levels only.
+    // Returns the verifier's answer for these levels. Phones of API 30 and later require v2 or
+    // later if the app targets 30 or later. The verifier checks this rule only if the range ends at
+    // the app's target level or later. If the package has neither v3 nor v3.1, a range that ends at
+    // 30 or later is therefore verified without an upper end. The missing end changes no other
+    // answer for this package. A package with v3 or v3.1 is verified with the exact end, because
+    // its signers can be for some levels only.
     private static Range verify(DataSource source, int first, int last, boolean hasNewer)
             throws Exception {
         if (first >= KNOWS_V31 && !hasMethod(ApkVerifier.Result.class, "isVerifiedUsingV31Scheme")
@@ -294,8 +295,8 @@ public final class InstallerVerifier {
         return object("issue", text(name), "parameters", list(texts), "text", text(words));
     }
 
-    // The signers of v3 and v3.1 in the signing block. Each of them is for a range of levels.
-    // Nothing is verified here. Signers after a malformed part of the block are not found, and the
+    // The signers of v3 and v3.1 in the signing block. Each signer is for a range of levels. This
+    // class verifies nothing. Signers after a malformed part of the block are not found, and the
     // verifier reports that part as an error.
     private static final class NewerSigners {
         private static final int V3 = 0xf05368c0;
@@ -304,8 +305,9 @@ public final class InstallerVerifier {
         private static final int MOST_BYTES = 16 << 20;
         private static final int MOST_SIGNERS = 100;
 
-        // Adds the first level of each scheme and of each signer, and the level after each signer's
-        // last level. Returns true if the package has v3 or v3.1.
+        // Adds KNOWS_V3 if the package has v3, and KNOWS_V31 if the package has v3.1. Adds each
+        // signer's first level, and the level after the signer's last level. Returns true if the
+        // package has v3 or v3.1.
         static boolean read(DataSource source, SortedSet<Integer> starts) {
             boolean hasAny = false;
             for (int id : new int[] {V3, V31}) {
@@ -341,17 +343,19 @@ public final class InstallerVerifier {
             }
         }
 
-        // Ignores levels that no phone has. Such a level means that the signer's range has no
-        // beginning or no end.
+        // Ignores a level that no phone has. Signers whose range has no beginning or no end use
+        // such levels.
         private static void addLevel(long level, SortedSet<Integer> starts) {
             if (level > 0 && level < NO_PHONES_LEVEL) {
                 starts.add((int) level);
             }
         }
 
-        // The value of the block's first pair with this ID, or null. The fields of a pair: a length
-        // of 8 bytes, an ID of 4 bytes, and the value. The block begins with its size (8 bytes),
-        // which the pairs follow. It ends with the size again and the magic (24 bytes together).
+        // Returns the value of the first pair with the ID `wanted` in the signing block. Returns
+        // null if no such pair can be found, or if the block is larger than MOST_BYTES. The fields
+        // of a pair: a length of 8 bytes, an ID of 4 bytes, and the value. The block begins with
+        // its size (8 bytes). The pairs follow. The block ends with the size again and the magic
+        // (24 bytes together).
         private static ByteBuffer find(DataSource source, int wanted) {
             try {
                 ApkUtils.ZipSections sections = ApkUtils.findZipSections(source);
@@ -408,7 +412,7 @@ public final class InstallerVerifier {
         return "[" + String.join(",", values) + "]";
     }
 
-    // The text may contain names from the file, which need not be valid UTF-16.
+    // The text may contain a name from the file. The name can be invalid UTF-16.
     private static String text(String words) {
         String all = words == null ? "" : words;
         StringBuilder json = new StringBuilder("\"");

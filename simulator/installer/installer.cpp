@@ -77,9 +77,9 @@ bool Installer::Start() {
   const ScopedFd theirs(ends[1]);
   pipe_.emplace(ends[0]);
   std::string words[] = {"java",
-                         "-Xmx512m",  // the same limit of the heap for every package
+                         "-Xmx512m",  // limits the heap, even for a hostile package
                          "-XX:+UseSerialGC",
-                         "-XX:TieredStopAtLevel=1",  // most runs are short
+                         "-XX:TieredStopAtLevel=1",  // only the fast compiler: most runs are short
                          "-XX:-UsePerfData",         // leaves no files in /tmp
                          "-cp",
                          options_.program + ":" + kVerifierLibrary,
@@ -139,8 +139,8 @@ bool Send(int fd, std::string_view bytes) {
   return true;
 }
 
-// Receives one line, without its line feed. Returns false if the line does not end before the
-// deadline, is longer than kLongest, or is cut off by the end of the program.
+// Receives one line, without its line feed. Returns false if the deadline passes first, if about
+// kLongest bytes contain no line feed, or if the Java program ends first.
 bool Receive(int fd, const Deadline& deadline, std::string* line) {
   constexpr int kNowAndThen = 100;  // milliseconds
   constexpr size_t kLongest = 64 << 20;
@@ -148,7 +148,7 @@ bool Receive(int fd, const Deadline& deadline, std::string* line) {
   while (line->size() < kLongest && !deadline.HasPassed()) {
     pollfd waiting = {fd, POLLIN, 0};
     if (poll(&waiting, 1, kNowAndThen) <= 0) continue;
-    // Judge holds its lock during this wait on purpose: files are judged one after the other.
+    // Judge holds mutex_ during this wait on purpose: packages are judged one after the other.
     // NOLINTNEXTLINE(clang-analyzer-unix.BlockInCriticalSection)
     const ssize_t size = recv(fd, part.data(), part.size(), 0);
     if (size <= 0) return false;

@@ -49,7 +49,8 @@ namespace {
 
 Judgement NoAnswer(const std::string& why) { return {Judgement::State::kGaveUp, why, {}}; }
 
-// A verified package must have a signer and no error. Any other package must have an error.
+// Returns false if the range is malformed. A verified range must have a signer and no error. Any
+// other range must have an error.
 bool ReadRange(const Json& json, RangeJudgement* range) {
   if (!json.is_object()) return false;
   const auto first = json.find("first"), last = json.find("last"), verified = json.find("verified");
@@ -118,14 +119,14 @@ std::optional<std::string> FromHex(const std::string& digits) {
   return bytes;
 }
 
-// Returns an empty text if the object has no text with this name.
+// Returns an empty text if `json` is not an object, or has no text under `key`.
 std::string TextOf(const Json& json, const char* key) {
   if (!json.is_object()) return {};
   const auto text = json.find(key);
   return text != json.end() && text->is_string() ? text->get<std::string>() : std::string();
 }
 
-// Returns null if the object has no list with this name.
+// Returns null if `json` is not an object, or has no list under `key`.
 const Json* ListOf(const Json& json, const char* key) {
   if (!json.is_object()) return nullptr;
   const auto list = json.find(key);

@@ -1,6 +1,6 @@
 // The judgement of apksig, the platform's own verifier: whether a phone's installer installs the
-// package. apksig runs in a separate program, which reads hostile files. Its answer is therefore
-// not trusted: a malformed answer counts as no answer.
+// package. apksig runs in a separate program. A hostile file can influence the answer of this
+// program. The answer is therefore not trusted: a malformed answer counts as no answer.
 #pragma once
 
 #include <climits>

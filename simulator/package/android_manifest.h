@@ -14,14 +14,14 @@ struct AndroidManifest {
   // The strings of the document overlap. The platform's parser could then use many times the
   // document's size in memory, so the document is not read.
   bool has_overlaps = false;
-  // The package's name as the tool's own code reads it; none if the strings overlap or the document
-  // does not parse.
+  // The package's name as the tool's own code reads it; none if the strings overlap or the
+  // platform's parser refuses the document.
   std::optional<std::string> package_name;
   // The package's name by the installer's rules: the root's attribute "package" without a
   // namespace. UTF-8, up to the first NUL.
   std::string installer_name;
-  // The attribute extractNativeLibs of the first <application> element; none if this element has no
-  // such attribute with a boolean or integer value.
+  // The attribute extractNativeLibs, in any namespace, of the first <application> element after the
+  // root's start. None if no such attribute has a boolean or integer value.
   std::optional<bool> extracts_libraries;
 };
 

@@ -1,9 +1,11 @@
 // The entries of a zip archive. They are read with the platform's own zip library and the tool's
-// code, as in the tool. The file is not trusted, so Read() and ReadToCompare() refuse entries that
-// are too long. Log messages of the library and of the tool's code are dropped in this process.
+// code, as in the tool. A hostile entry could use up the memory, so Read() and ReadToCompare()
+// refuse entries that are too long. The first Archive silences the log in the whole process: the
+// messages of the library and of the tool's code are dropped.
 //
 // The library maps a part of the file into memory. If the file becomes shorter while an Archive
-// exists, the missing part reads as zeros, and HasShrunk() returns true.
+// exists, pages beyond the new end read as zeros. HasShrunk() is true after such a read. Both hold
+// only in the thread that made the Archive (simulator/package/shrinking.h).
 #pragma once
 
 #include <ziparchive/zip_archive.h>
@@ -45,10 +47,10 @@ struct ArchiveWalk {
 
 class Archive {
  public:
-  // In bytes: Read() refuses longer entries.
+  // In bytes of uncompressed data: Read() refuses longer entries.
   static constexpr uint32_t kLongestRead = 64 << 20;
 
-  // In bytes: ReadToCompare() refuses longer entries.
+  // In bytes of uncompressed data: ReadToCompare() refuses longer entries.
   static constexpr uint32_t kLongestCompared = 512 << 20;
 
   enum class ReadResult { kRead, kMissing, kDamaged, kTooLong };
@@ -73,8 +75,8 @@ class Archive {
   ReadResult ReadToCompare(const std::string& name, std::vector<uint8_t>* content) const;
   // The names of the entries that Read() has refused so far, because they are too long.
   const std::vector<std::string>& too_long() const { return too_long_; }
-  // Passes the entry to `take`, part by part, until `take` returns false. Returns false if the
-  // entry was not passed to its end.
+  // Passes the uncompressed data of the entry to `take`, part by part, until `take` returns false.
+  // Returns false if `take` returned false, or if the entry cannot be read to its end.
   bool Stream(const std::string& name,
               const std::function<bool(std::string_view part)>& take) const;
 

@@ -21,8 +21,8 @@ std::optional<ArchiveEnd> FindArchiveEnd(int fd) {
   const size_t at = tail.size() < kRecordSize ? std::string::npos
                                               : tail.rfind(kMark, tail.size() - kRecordSize, 4);
   if (at == std::string::npos) return {};
-  // The fields of the record: signature, two disk numbers, the number of entries on this disk, the
-  // number of all entries, the directory's size and its offset.
+  // The record begins with these fields: signature, two disk numbers, the number of entries on this
+  // disk, the number of all entries, the size of the directory, the offset of the directory.
   CBS record = ToCbs(std::string_view(tail).substr(at));
   ArchiveEnd end = {};
   const bool is_read = CBS_skip(&record, 10) != 0 &&
@@ -39,8 +39,9 @@ std::vector<ArchiveEntry> ReadDirectory(int fd, const ArchiveEnd& end) {
   while (entries.size() < end.entry_count) {
     const std::string record = ReadAt(fd, offset, kRecordSize);
     constexpr uint16_t kEncrypted = 1;  // APPNOTE.TXT 4.4.4, bit 0
-    // The fields of the record: signature, two versions, flags, ten other bytes, the two sizes, and
-    // the lengths of the three parts that follow the record.
+    // The record begins with these fields: signature, two versions, flags, ten other bytes, the
+    // compressed size, the uncompressed size, and the lengths of the name, the extra field and the
+    // comment. These three parts follow the record.
     CBS fields = ToCbs(record);
     uint32_t size = 0;
     uint16_t flags = 0;

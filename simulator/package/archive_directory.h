@@ -26,12 +26,12 @@ struct ArchiveEntry {
 };
 
 // Finds the end record of the open file `fd`. If several byte sequences look like an end record,
-// the last of them counts. None if the file has no end record.
+// the last of them counts. None if the end record is missing or cannot be read.
 std::optional<ArchiveEnd> FindArchiveEnd(int fd);
 
 // Returns the entries in the order of the directory. Ends at the first malformed record. The
 // directory does not show which entries are damaged, so `is_damaged` is false in all results.
-// Archive::Entries sets it later.
+// Archive::Entries sets this member later.
 std::vector<ArchiveEntry> ReadDirectory(int fd, const ArchiveEnd& end);
 
 // Reads `size` bytes of the file from `offset` on. Returns fewer if the file ends earlier or cannot

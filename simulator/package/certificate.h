@@ -13,16 +13,17 @@
 namespace simulator {
 
 struct PublicKey {
-  std::string algorithm;  // "RSA", "EC" or "DSA"; else the library's name
+  std::string algorithm;  // "RSA", "EC" or "DSA"; else the name that AlgorithmOf() returns
   int bits = 0;           // 0: not known
   std::string sha256;     // of the SubjectPublicKeyInfo; digests are in lower-case hexadecimal
-  // Of the modulus without leading zeros; empty if this is not an RSA key that the library can
-  // read.
+  // The SHA-256 digest of an RSA modulus without leading zeros. Empty if the key is not an RSA key,
+  // or if the library cannot read the key.
   std::string modulus_sha256;
 };
 
 struct CertificateFacts {
-  // The last attribute first, as apksigner writes names: "CN=Vault, O=Example". UTF-8.
+  // The last RelativeDistinguishedName first, as apksigner writes names: "CN=Vault, O=Example".
+  // UTF-8.
   std::string subject;
   std::string issuer;
   bool is_self_issued = false;  // issuer and subject are the same name
@@ -30,14 +31,13 @@ struct CertificateFacts {
   std::string sha1;             // of the whole certificate; some stores identify signers by it
   // The algorithm of the certificate's own signature, such as "SHA384withRSA".
   std::string signature_algorithm;
-  bool has_known_digest = false;  // it is signed with RSA PKCS#1 v1.5 over MD5, SHA-1 or SHA-256
+  bool has_known_digest = false;  // signed with RSA PKCS#1 v1.5 over MD5, SHA-1 or SHA-256
   // The end of the certificate's validity, in seconds since 1970 (UTC); none: it cannot be read.
   std::optional<int64_t> not_after;
   PublicKey key;
   // A SignerIdentifier (RFC 5652) names a certificate by issuer and serial number, or by the
-  // subject key identifier. `issuer_and_serial` and `key_id` are the contents of such a
-  // SignerIdentifier for this certificate. `key_id` is empty if the certificate has no subject key
-  // identifier.
+  // subject key identifier. `issuer_and_serial` is the DER of the issuer, then the DER of the
+  // serial number. `key_id` is the subject key identifier; empty if the certificate has none.
   std::string issuer_and_serial;
   std::string key_id;
 };
@@ -63,7 +63,7 @@ class Sha256 {
  public:
   Sha256() { SHA256_Init(&state_); }
   void Add(std::string_view bytes) { SHA256_Update(&state_, bytes.data(), bytes.size()); }
-  // Call it once, after the last part.
+  // Returns the digest in lower-case hexadecimal. Call Hex() only once, after the last Add().
   std::string Hex();
 
  private:

@@ -1,5 +1,5 @@
-// The entries of a package, each compared with its digest in the manifest. The tool's own code
-// finds the digest for a name and compares it. In its own run, the tool compares only a few of the
+// Lists the entries of a package, and compares them with their digests in the manifest. The tool's
+// own code finds and compares the digests. When the tool itself runs, it compares only a few
 // entries.
 #pragma once
 
@@ -12,29 +12,29 @@
 
 namespace simulator {
 
-// The answer of the tool's code for an entry and its digest in the manifest.
+// The result of comparing an entry with its digest in the manifest.
 enum class EntryDigest {
-  kUnlisted,  // the manifest has no digest for it
+  kUnlisted,  // the manifest has no digest for the entry
   kMatches,
   kDiffers,
-  kNotCompared,  // the entry cannot be read or is too long, the tool does not know the kind of its
-                 // digest, or the time was up
+  kNotCompared,  // the entry cannot be read or is too long, the tool does not support the digest's
+                 // algorithm, or the time limit had passed
 };
 
 struct ListedEntry {
   ArchiveEntry entry;
-  bool is_listed;     // the manifest has a digest for it
-  bool is_signature;  // it is a part of the JAR signature itself
+  bool is_listed;     // the manifest has a digest for the entry
+  bool is_signature;  // its name is that of a manifest, signature file or signature block
   EntryDigest digest = EntryDigest::kUnlisted;
   bool has_sha1 = false;  // the digest that the tool would compare is a SHA-1 digest
 };
 
 struct PackageEntries {
   std::vector<ListedEntry> all;      // in the order of the archive
-  std::vector<std::string> missing;  // names in the manifest that the archive does not have
+  std::vector<std::string> missing;  // names that have a digest in the manifest but no entry
 };
 
-// True if the time is up.
+// Returns true if the caller's time limit has passed.
 using IsLate = std::function<bool()>;
 // For callers without a time limit.
 inline bool IsNeverLate() { return false; }
@@ -43,7 +43,7 @@ inline bool IsNeverLate() { return false; }
 PackageEntries CompareEntries(Archive* archive, std::vector<uint8_t> manifest,
                               const IsLate& is_late);
 
-// True if the tool reads a digest with this name, such as "SHA1-Digest", as SHA-1.
+// True if the tool treats `name` as the name of a SHA-1 digest ("SHA1-Digest").
 bool IsSha1Digest(const std::string& name);
 
 }  // namespace simulator

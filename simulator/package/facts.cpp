@@ -107,7 +107,7 @@ uint64_t CountPackages(const std::string& directory) {
   return count;
 }
 
-// True if the only control characters are those of texts, such as line feeds.
+// False if `start` has a control character that texts do not contain, such as NUL.
 bool IsText(const std::string& start) {
   return std::all_of(start.begin(), start.end(), [](char c) {
     const unsigned char byte = static_cast<unsigned char>(c);
@@ -163,7 +163,8 @@ void FindLibraries(const Archive& archive, const std::string& path, PackageFacts
   }
 }
 
-// Opens the file at the library's place like the tool, but does not wait for the holder of a lease.
+// Tries to open the file at the path where the tool looks for the library. Unlike the tool, does
+// not wait for the holder of a lease.
 LibraryFacts FindLibrary(const std::string& entry, const std::string& path) {
   LibraryFacts library;
   library.entry = entry;

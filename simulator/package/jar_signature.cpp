@@ -79,7 +79,7 @@ void ReadBlock(const Bytes& block, JarSignatureFacts* jar) {
                                  signer != jar->certificate->key_id;
 }
 
-// None if the key ends beyond the block, because the tool does not accept such a key.
+// Returns no key if the modulus ends beyond the block: the tool refuses such a key.
 std::optional<ToolKey> ReadToolKey(const Bytes& block, const pkcs7& record) {
   const auto room = static_cast<size_t>(block.data() + block.size() - record.modulus);
   if (record.modulus > block.data() + block.size() || record.modulus_length > room) return {};

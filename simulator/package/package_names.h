@@ -1,4 +1,4 @@
-// Recognises packages by their file names. Reads no files.
+// Recognises the file names of packages and JARs. Reads no files.
 #pragma once
 
 #include <strings.h>
@@ -9,11 +9,11 @@
 
 namespace simulator {
 
-// The endings of the file names of packages, JARs, and archives in which packages are delivered.
+// The endings of the file names of packages, JARs, sets of packages, and app bundles.
 inline constexpr std::string_view kPackageEndings[] = {".apk",  ".jar",  ".apks",
                                                        ".xapk", ".apkm", ".aab"};
 
-// True if `name` has one of these endings, in upper or lower case.
+// True if `name` ends with one of kPackageEndings. Ignores the case of letters.
 inline bool IsPackageName(std::string_view name) {
   return std::any_of(std::begin(kPackageEndings), std::end(kPackageEndings),
                      [name](std::string_view ending) {

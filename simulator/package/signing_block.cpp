@@ -12,8 +12,8 @@ constexpr std::string_view kMagic = "APK Sig Block 42";
 constexpr size_t kSizeField = 8;
 constexpr size_t kFooter = kSizeField + kMagic.size();
 
-// The limit for the signers of all schemes together. A block with more signers counts as damaged
-// here. Phones accept at most ten v2 signers, and use one v3 signer.
+// The highest number of signers, of all schemes together. A block with more signers counts as
+// damaged here. A phone accepts at most ten v2 signers, and uses only one signer of v3 or v3.1.
 constexpr size_t kMostSigners = 16;
 
 // The known schemes. `id` identifies the scheme's pair in the block.
@@ -81,7 +81,7 @@ const char* SchemeOf(uint32_t id) {
   return nullptr;
 }
 
-// Reads the signers of one scheme. The platform requires at least one.
+// Reads the signers of one scheme. The platform requires at least one signer.
 bool ReadSigners(const char* scheme, CBS value, std::vector<NewerSigner>* signers) {
   CBS sequence, signer, certificate;
   if (!TakePrefixed(&value, &sequence) || CBS_len(&sequence) == 0) return false;

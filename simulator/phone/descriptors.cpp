@@ -26,7 +26,8 @@ std::string PathOf(int fd) {
   const int errno_before = errno;
   char path[PATH_MAX];
   const std::string link = "/proc/self/fd/" + std::to_string(fd);
-  // Makes the system call directly, because some tests replace readlink with a function that fails.
+  // Makes the system call directly, so that a test that replaces readlink
+  // (tests/faults/fault_injector.cpp) does not change the result.
   const long length = syscall(SYS_readlinkat, AT_FDCWD, link.c_str(), path, sizeof(path));
   errno = errno_before;
   return length < 0 ? "" : std::string(path, static_cast<size_t>(length));

@@ -6,10 +6,11 @@
 
 namespace simulator {
 
-// Moves the open file `fd` to a high descriptor, which is close-on-exec. High means: in the upper
-// quarter of the process's range, or from 768 on if the range has more than 1024 descriptors. The
-// system hands out the lowest free descriptor, so the tool still gets the same descriptors. Returns
-// the new descriptor, or `fd` itself if it could not be moved.
+// Moves the open file `fd` to a high descriptor, which is close-on-exec. High means: at least three
+// quarters of the process's limit (RLIMIT_NOFILE), or at least 768 if the limit is above 1024. The
+// system uses the lowest free descriptor for each new file. High descriptors therefore do not
+// change the descriptors of the tool's files. Returns the high descriptor, or `fd` itself if the
+// file could not be moved.
 int MoveHigh(int fd);
 
 // The path of the open file `fd`, as the kernel knows it; empty if `fd` is not open. Does not

@@ -1,7 +1,7 @@
 // The files in which the kernel publishes each task's integrity value: /proc/self/integrity/value
 // and /proc/PID/integrity/value, for callers that open them with fopen or fopen64. The files are
-// read-only. Each opening, of any task's file, delivers the next of the phone's integrity values.
-// The last value repeats.
+// read-only. The phone's settings list integrity values. Each opening for reading, of any existing
+// task's file, delivers the next value of this list. The last value repeats.
 #include <fcntl.h>
 #include <sys/mman.h>
 #include <unistd.h>

@@ -1,8 +1,8 @@
 // The journal of a simulated run: one JSON object per line, in the order of the events
 // (docs/journal.md describes it). Two kinds of code write to the journal: apktoolkit-sim, and the
 // stand-ins for libzu, the kernel and the log, which are libraries inside the tool's process. Each
-// line is one appending write, so the lines are in the order of the writes. This code uses no JSON
-// library, because the stand-ins must not bring libraries into the tool's process.
+// line is one appending write, so the lines are in the order of the writes. The stand-ins must load
+// no further libraries into the tool's process, so this file uses no JSON library.
 #pragma once
 
 #include <cstdint>
@@ -13,7 +13,7 @@
 
 namespace simulator {
 
-// The version of the schema; the journal's first line contains it.
+// The version of docs/journal.schema.json; the journal's first line contains this version.
 inline constexpr int kJournalVersion = 1;
 
 // One line under construction. Keys are plain ASCII names.
@@ -34,7 +34,7 @@ class Event {
 
   // The whole line, with its line feed.
   std::string Line() const { return line_ + "}\n"; }
-  // Appends the line to the open file `journal`. Returns false if it could not be written whole.
+  // Appends the line to the open file `journal`. Returns false if the line was not written whole.
   bool AppendTo(int journal) const;
 
  private:
@@ -42,8 +42,8 @@ class Event {
 };
 
 // Opens the journal at `path` for appending, close-on-exec. Its descriptor has a high number, so
-// that the process's own files get the same descriptors as without the journal. Returns -1 if it
-// cannot be opened.
+// that the process's own files get the same descriptors as without the journal. Returns -1 if the
+// journal cannot be opened.
 int OpenJournal(const char* path);
 
 }  // namespace simulator

@@ -2,9 +2,9 @@
 // has in the C library.
 //
 // This file, integrity_file.cpp, log.cpp and standard_output.cpp are parts of one library, which is
-// loaded before all others. It replaces the functions by which the tool uses the phone's kernel and
-// log. Calls that do not concern the phone are passed, unchanged, to the function of the same name
-// in a library that is loaded later.
+// loaded before all others. The library replaces the functions by which the tool uses the phone's
+// kernel and log. It also records the tool's standard output. Calls that do not concern the phone
+// are passed, unchanged, to the function of the same name in a library that is loaded later.
 #include <fcntl.h>
 #include <sys/mman.h>
 #include <sys/stat.h>
@@ -53,7 +53,7 @@ __attribute__((constructor)) void Attach() {
 
 }  // namespace
 
-// Every command has at most one argument, which is not larger than a pointer.
+// Every command of fcntl has at most one argument, which is not larger than a pointer.
 STAND_IN int fcntl(int fd, int command, ...) {
   static FcntlFunction* const next = NextFunction<FcntlFunction>("fcntl");
   va_list arguments;
@@ -65,7 +65,7 @@ STAND_IN int fcntl(int fd, int command, ...) {
   return next(fd, command, argument);
 }
 
-// In the C library of a 64-bit system, both names are the same function.
+// In the C library of a 64-bit system, fcntl and fcntl64 are the same function.
 STAND_IN int fcntl64(int fd, int command, ...) __attribute__((alias("fcntl")));
 
 namespace {
@@ -91,7 +91,8 @@ int Verify(int fd) {
   return Answer(&event, error, errno_before);
 }
 
-// A descriptor that was opened with O_PATH only names a file. The kernel does not accept it.
+// Returns EBADF, as the kernel does, if `fd` is not open or was opened with O_PATH. Otherwise
+// returns 0.
 int DescriptorError(int fd) {
   const int flags = fcntl(fd, F_GETFL);
   return flags < 0 || (flags & O_PATH) != 0 ? EBADF : 0;
@@ -111,9 +112,9 @@ int CopyPayload(const void* argument, std::string* payload) {
   return 0;
 }
 
-// Copies from the process's memory as the kernel does: if the memory cannot be read, returns false,
-// and no signal is sent. Copies through a file, because pwrite reports unreadable memory as an
-// error, also under an emulator.
+// Copies `size` bytes from `from` to `to`. Returns false if the memory at `from` cannot be read.
+// That causes no signal, as in the kernel. The bytes go through a file, because pwrite reports
+// unreadable memory as an error, also under an emulator.
 bool CopyIn(const char* from, size_t size, char* to) {
   const ssize_t wanted = static_cast<ssize_t>(size);
   return pwrite(Scratch(), from, size, 0) == wanted && pread(Scratch(), to, size, 0) == wanted;
@@ -125,7 +126,7 @@ int Scratch() {
   return scratch;
 }
 
-// The files that the simulated kernel signed during this process.
+// The files that the simulated kernel has signed since this process started.
 struct SignedFiles {
   std::mutex mutex;
   std::vector<FileId> ids;
@@ -155,7 +156,7 @@ bool IsTrusted(int fd) {
   return holds(ThisPhone().trusted) || holds(Signed().ids);
 }
 
-// Records the kernel's answer in the journal, and returns it.
+// Records the kernel's answer in the journal. Sets errno, and returns the result of fcntl.
 int Answer(Event* event, int error, int errno_before) {
   const int result = error == 0 ? 0 : -1;
   Record(event->Number("result", result).Number("errno", error));

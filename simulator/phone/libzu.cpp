@@ -1,5 +1,5 @@
-// The stand-in for libzu: a replacement for the process-authentication library, whose source is
-// closed. The tool is linked against it in the same way as against the real library.
+// The stand-in for libzu, the process-authentication library. The source of libzu is closed. The
+// tool is linked against the stand-in in the same way as against libzu.
 #include "sign/libzu.h"
 
 #include <string_view>
@@ -11,7 +11,7 @@ namespace simulator {
 
 namespace {
 
-// The answer if no phone is simulated. A workstation has no service to register with.
+// The result if no phone is simulated. A workstation has no service to register with.
 constexpr int kNoService = -1;
 
 }  // namespace

@@ -62,8 +62,9 @@ STAND_IN int __android_log_buf_print(int, int priority, const char* tag, const c
   return result;
 }
 
-// The platform's C++ libraries, such as the zip library, write their warnings with one of the next
-// two functions. Each generation of the log library has only one of the two.
+// The platform's C++ libraries, such as the zip library, log with one of the next two functions.
+// The log library has two generations (log_library.h). Each generation has only one of the two
+// functions.
 STAND_IN void __android_log_write_logger_data(__android_logger_data* data, const char* text) {
   ReadLogRecord(data, text, Log);
 }

@@ -2,8 +2,8 @@
 //
 // The library has two generations. Up to API level 29, a record is an `__android_logger_data`, and
 // the text is a separate argument. In later levels, a record is an `__android_log_message`, which
-// contains the text. ReadLogRecord hides this difference. Texts and records belong to the caller,
-// and are read only during the call.
+// contains the text. ReadLogRecord hides this difference. Texts and records belong to the caller.
+// ReadLogRecord keeps no pointer to them.
 #pragma once
 
 #include <android/log.h>

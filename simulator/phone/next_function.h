@@ -7,8 +7,8 @@
 
 namespace simulator {
 
-// The next function `name` after this library in the order of loading. The process would call this
-// function without the stand-in.
+// The first function `name` in the libraries that are loaded after the stand-in; null if none of
+// them has this function. Without the stand-in, the process would call this function.
 template <typename Function>
 Function* NextFunction(const char* name) {
   return reinterpret_cast<Function*>(dlsym(RTLD_NEXT, name));

@@ -1,8 +1,8 @@
 // The settings of the simulated phone. apktoolkit-sim passes them to the stand-ins, the libraries
 // that answer in place of the phone. Each setting is passed in an environment variable with the
 // prefix APKTOOLKIT_SIM_. Without its variable, a setting has the default below. The defaults,
-// except that of `journal`, are those of a healthy phone. Both apktoolkit-sim and the stand-ins use
-// this file, so that names and formats are defined in one place.
+// except that of `journal`, are those of a healthy phone. Only settings.cpp defines the names and
+// formats of the variables. Both apktoolkit-sim and the stand-ins use the functions below.
 #pragma once
 
 #include <sys/types.h>
@@ -23,15 +23,16 @@ inline bool operator==(const FileId& a, const FileId& b) {
   return a.device == b.device && a.inode == b.inode;
 }
 
-// As a value in `PhoneSettings::integrity`: the integrity file does not exist when it is opened.
+// An element of `PhoneSettings::integrity`. An opening that gets this element fails with ENOENT.
 inline constexpr char kMissing[] = "missing";
 
 struct PhoneSettings {
-  // The file that the stand-ins append their events to. Empty: nothing is recorded, and libzu finds
-  // no service.
+  // The path of the file to which the stand-ins append their events. Empty: nothing is recorded,
+  // and each registration with libzu fails.
   std::string journal;
-  // The texts of the files /proc/PID/integrity/value. Each opening of such a file reads the next
-  // text. The last text repeats. The list has at least one element.
+  // The texts of the files /proc/PID/integrity/value. Each opening of any of these files delivers
+  // the next text. After the last text, each opening delivers the last text again. The list has at
+  // least one element.
   std::vector<std::string> integrity = {"1f"};
   // The files that the kernel trusts from the start.
   std::vector<FileId> trusted;
@@ -39,15 +40,15 @@ struct PhoneSettings {
   int sign_errno = 0;
   // The kernel's errno for a request to verify a file that it does not trust.
   int verify_errno = ENOKEY;
-  // The answer of libzu to a registration.
+  // The result of ZuNewCertificate, the function of libzu that registers a key.
   int zu_result = 0;
 };
 
 // Reads the settings from this process's environment.
 PhoneSettings SettingsFromEnvironment();
 
-// Returns the settings as NAME=VALUE words. Every setting has a word, so a variable that this
-// process inherited cannot change a setting.
+// Returns the environment variables of all settings, as NAME=VALUE. Even a default is passed.
+// Otherwise a variable that this process inherited could change the setting.
 std::vector<std::string> SettingsToEnvironment(const PhoneSettings& phone);
 
 }  // namespace simulator

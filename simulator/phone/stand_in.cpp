@@ -4,8 +4,9 @@ namespace simulator {
 
 namespace {
 
-// Returns the journal's descriptor, or -1 if there is no journal. The journal is opened when this
-// library is loaded, so that events are recorded even if the process has no free descriptor later.
+// Returns the journal's descriptor, or -1 if the settings name no journal or the journal could not
+// be opened. The journal is opened when the stand-in is loaded. Events are therefore recorded even
+// if the process has no free descriptor later.
 int JournalDescriptor() {
   static const int journal =
       ThisPhone().journal.empty() ? -1 : OpenJournal(ThisPhone().journal.c_str());

@@ -1,7 +1,8 @@
-// Shared by the two stand-ins: the libraries that replace the phone's kernel and libzu inside the
-// tool's process. This file has the phone's settings, the journal, and a means to keep errno
-// unchanged for the tool. Each of the two libraries has its own copy of this code. Nothing here is
-// destroyed at exit, because the tool's last output is recorded after the destructors have run.
+// Shared by the two stand-ins. A stand-in is a library that replaces a part of the phone inside the
+// tool's process: one replaces the kernel and the log, the other replaces libzu. This file has the
+// phone's settings, the journal, and a class that keeps errno unchanged for the tool. Each stand-in
+// has its own copy of this code. The settings are never destroyed, because the tool's last output
+// is recorded after the destructors have run.
 #pragma once
 
 #include <cerrno>
@@ -17,7 +18,8 @@ namespace simulator {
 // The settings of the simulated phone. The first call reads them from the environment.
 const PhoneSettings& ThisPhone();
 
-// Appends `event` to the journal. Does nothing without a journal.
+// Appends `event` to the journal. Does nothing if the settings name no journal, or if the journal
+// could not be opened.
 void Record(const Event& event);
 
 // Restores errno at the end of its scope.

@@ -1,6 +1,6 @@
-// Records the tool's standard output as events. `stdout` becomes a line-buffered stream. It records
-// each line in the journal, in its place among the other events, and then writes the line to
-// descriptor 1.
+// Records the tool's standard output as events. `stdout` becomes a line-buffered stream. This
+// stream first records each line in the journal, and then writes the line to descriptor 1. Without
+// line buffering, the journal could have a line after events that happened later.
 #include <unistd.h>
 
 #include <cstdio>

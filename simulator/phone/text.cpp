@@ -39,7 +39,7 @@ std::string DecodeText(std::string_view utf8) {
   while (!utf8.empty()) {
     const std::string_view character = utf8.substr(0, std::max<size_t>(Utf8Length(utf8), 1));
     if (IsPrivateByte(character)) {
-      // U+F780 to U+F7FF is EF 9E 80 to EF 9F BF.
+      // In UTF-8, U+F780 to U+F7FF are the bytes EF 9E 80 to EF 9F BF.
       const unsigned high = static_cast<uint8_t>(character[1]) & 3U;
       const unsigned low = static_cast<uint8_t>(character[2]) & 0x3fU;
       bytes += static_cast<char>((high << 6 | low) & 0xffU);
@@ -61,7 +61,7 @@ std::string HexText(std::string_view bytes) {
   return text;
 }
 
-// A character is valid as in RFC 3629 §4: no overlong forms, no surrogates, nothing above U+10FFFF.
+// Valid characters (RFC 3629 §4) have no overlong form, are not surrogates, and end at U+10FFFF.
 size_t Utf8Length(std::string_view bytes) {
   constexpr uint32_t kLeast[] = {0, 0, 0x80, 0x800, 0x10000};
   if (bytes.empty()) return 0;

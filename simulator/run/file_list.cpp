@@ -102,8 +102,8 @@ void Walk(const std::string& root, FileList* list) {
   std::move(found.begin(), found.end(), std::back_inserter(list->files));
 }
 
-// Skips links to directories. If the kind of an entry cannot be read, for example because its path
-// is too long, the entry is listed as unreadable.
+// Skips symbolic links to directories. If the file type of an entry cannot be read, for example
+// because the entry's path is too long, the entry is listed as unreadable.
 void AddEntry(const fs::directory_entry& entry, std::vector<std::string>* directories,
               std::vector<ListedFile>* found, size_t* others) {
   std::error_code error;

@@ -1,5 +1,5 @@
-// The files for which the tool is run. They are named on the command line or in a list, or found
-// below a directory. All files are listed before the first run.
+// The files for which the tool is run. Each file is named on the command line or in a list, or was
+// found below a named directory. All files are listed before the first run.
 #pragma once
 
 #include <cstddef>
@@ -30,14 +30,14 @@ struct ListedFile {
 
 struct FileList {
   std::vector<ListedFile> files;
-  size_t others = 0;  // files below searched directories; their names are not package names
+  size_t others = 0;  // how many files below directories were skipped for their names
 };
 
-// Lists the files of the command line and then those of the list, in their order. With
-// `is_recursive` a directory is replaced by the files below it that have package names
-// (IsPackageName), sorted by their paths, byte by byte. Symbolic links to directories are followed
-// if they are named, but not if they are found below a directory. Empty names in a list are
-// skipped.
+// Lists the names of the command line, then the names of the list, without sorting them. With
+// `is_recursive`, a directory is replaced by the files below it that have package names
+// (IsPackageName), sorted by their paths, byte by byte. A symbolic link to a directory is then
+// followed if the link was named, but is skipped if it was found below a directory. Empty names in
+// a list are skipped.
 //
 // Returns none on success, else the reason of the failure: the list cannot be read, has no names,
 // or has NUL bytes although its names end with line feeds.

@@ -1,5 +1,6 @@
 // Detects that a file is changed while it is examined. The tool, the simulator and the installer's
-// verifier read a file one after the other; if it changes, their answers are about different bytes.
+// verifier read a file one after the other. If the file changes meanwhile, their answers can be
+// about different bytes.
 #pragma once
 
 #include <sys/stat.h>
@@ -16,9 +17,10 @@ class FileWatch {
   explicit FileWatch(const std::string& path);
 
   // Call this function when nothing reads the file any more. If the file was changed since the
-  // construction, the run gets a failure in place of its result. A change of the inode alone, such
-  // as by a hard link or chmod, does not count if the bytes still have the digest that the run
-  // found. Does nothing if `path` was not a regular file, or if the run already has a failure.
+  // construction, the run gets a failure in place of its result. A change of only the ctime, such
+  // as by chmod or a new hard link, does not count if the bytes still have the digest in
+  // `run->facts`. Does nothing if `path` was not a regular file, or if the run already has a
+  // failure.
   void Check(FileRun* run) const;
 
  private:

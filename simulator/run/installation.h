@@ -21,14 +21,15 @@ enum class InstalledAbi {
 
 // Which packages are laid out.
 enum class InstallWhen {
-  kAlone,   // packages with library entries, if neither these libraries nor an installer's library
-            // directories are beside the package; not on a read-only file system
-  kAlways,  // all
+  kAlone,   // packages that have neither their libraries nor an installer's library directories
+            // beside them; no package on a read-only file system
+  kAlways,  // all packages with libraries
   kNever,
 };
 
-// The output shows this instead of the installation's directory, whose name differs in each run.
-// No path of a file begins like this, because paths from the kernel begin with "/".
+// The output shows this text instead of the installation's temporary directory, because the name of
+// that directory differs in each run. In a journal, no other path begins with this text, because
+// the kernel's paths begin with "/".
 inline constexpr char kInstalledDirectory[] = "<install>/";
 
 class Installation {
@@ -38,21 +39,23 @@ class Installation {
   Installation(const Installation&) = delete;
   Installation& operator=(const Installation&) = delete;
 
-  // Lays out the package at `file`. Lays out nothing if the file is not a package, if its Android
-  // manifest keeps the libraries inside, if it has no libraries for `abi`, or if `when` excludes
-  // it. Returns the reason of a failure, else none.
+  // Lays out the package at `file`. Lays out nothing if the file cannot be opened or is not a
+  // package. Also lays out nothing if the Android manifest keeps the libraries inside the package,
+  // if the package has no libraries for `abi`, or if `when` excludes the package. None of these
+  // cases is a failure. Returns the reason of a failure, else none.
   std::optional<std::string> LayOut(const std::string& file, InstallWhen when, InstalledAbi abi,
                                     const Deadline& deadline);
 
-  // The path of the package for the tool: base.apk in the temporary directory, or `file` if it was
-  // not laid out.
+  // The path of the file for the tool: base.apk in the temporary directory, or `file` if is_done()
+  // is false.
   const std::string& path() const { return path_; }
   // True if the package was laid out.
   bool is_done() const { return is_done_; }
-  // The journal with kInstalledDirectory instead of the name of this directory, so that the journal
-  // is the same in each run.
+  // The journal with kInstalledDirectory instead of the temporary directory. The paths in the
+  // journal are then the same in each run.
   std::string WithStablePaths(const std::string& journal) const;
-  // The library entries of Arm ABIs that were not chosen.
+  // The entries of libraries that were not laid out, because they belong to an Arm ABI that was not
+  // chosen.
   const std::set<std::string>& of_other_processors() const { return of_other_processors_; }
   // The library entries whose names no installer accepts.
   const std::vector<std::string>& left_out() const { return left_out_; }

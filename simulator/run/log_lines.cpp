@@ -14,8 +14,8 @@ namespace {
 
 constexpr size_t kNothing = SIZE_MAX;
 
-// The format texts of the tool's sources. `captured` is the index of the conversion to capture,
-// counted from 0.
+// The format texts with which the tool's sources write the log. `captured` is the index of the
+// conversion to capture, counted from 0.
 constexpr struct LogText {
   LogMeaning meaning;
   const char* format;
@@ -64,12 +64,12 @@ constexpr struct LogText {
     {LogMeaning::kRegistrationFailed, "ZuAddCertificate: ZuNewCertificate failed %d.\n", kNothing},
 };
 
-// A row of the table, prepared for comparisons.
+// A row of kLogTexts, prepared for comparisons.
 struct Pattern {
   const LogText* row;
   std::string start;  // the text before the first conversion
   std::regex whole;
-  char conversion;  // the captured one
+  char conversion;  // the letter of the captured conversion; 's' if nothing is captured
 };
 
 const std::vector<Pattern>& Patterns();
@@ -80,8 +80,8 @@ Pattern MakePattern(const LogText& row);
 LogLine ReadLogLine(const std::string& text) {
   LogLine line;
   line.whole = text.substr(0, text.size() - (!text.empty() && text.back() == '\n' ? 1 : 0));
-  // The log cuts texts to kLogTextSize - 1 bytes. A text of this length may have lost its end, so
-  // only its start can be compared.
+  // The log cuts texts to kLogTextSize - 1 bytes. A text of this length may have lost its end. Only
+  // the text before the format's first conversion is then compared.
   const bool is_cut = text.size() + 1 >= kLogTextSize;
   for (const Pattern& pattern : Patterns()) {
     const std::string& start = pattern.start;

@@ -8,8 +8,8 @@
 
 namespace simulator {
 
-// The meaning of a record of the tool's log. The comment above a group names the parts that
-// LogLine::text captures, if there are any.
+// The meaning of a record of the tool's log. For some meanings, LogLine::text is a captured part of
+// the record. The comments below name these parts.
 enum class LogMeaning {
   // kUnknown: the record has none of the known texts. kDetail: the record adds a detail to an error
   // that another record reports.

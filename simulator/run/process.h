@@ -9,13 +9,14 @@ namespace simulator {
 
 // Reserves the descriptors of closed standard streams, so that no file of this program gets such a
 // descriptor. Returns true if standard input was open before. Programs that this process starts
-// find the streams as they were before. After the call, only std::cout writes to standard output.
-// This program also contains code of the tool, and the lines that this code prints are discarded.
-// Call it before anything is printed.
+// find the streams as they were before. After the call, std::cout still writes to standard output,
+// but `stdout` writes to /dev/null. The tool's code in this program prints to `stdout`, so its
+// lines are discarded. Call this function before anything is printed.
 bool KeepStandardStreams();
 
-// After this call, SIGINT, SIGTERM, SIGHUP, SIGQUIT and SIGPIPE do not end the process before it
-// has cleaned up. Signals that were ignored before are still ignored.
+// After this call, SIGINT, SIGTERM, SIGHUP, SIGQUIT and SIGPIPE do not end the process, but make
+// IsInterrupted() true. The process can then clean up and call EndIfInterrupted(). Signals that
+// were ignored before are still ignored.
 void CatchInterruptions();
 bool IsInterrupted();
 // If a signal was caught, ends the process by that signal.
@@ -23,7 +24,7 @@ void EndIfInterrupted();
 
 // For posix_spawn: the new process gets a process group of its own. A signal from the keyboard goes
 // to a whole group, but must reach only this process, which then ends the new process. If the
-// signal ended the new process, that end would look like a failure of the new process.
+// signal itself ended the new process, this process would report a failure of the new process.
 class OwnProcessGroup {
  public:
   OwnProcessGroup();

@@ -102,7 +102,7 @@ void Reader::ReadInformation(const LogLine& line) {
   if (meaning == LogMeaning::kJarTakenUp || meaning == LogMeaning::kPackageTakenUp) Begin();
 }
 
-// Reads an error that was logged after the opening of the file.
+// Reads an error that was logged after the tool began to sign.
 void Reader::ReadError(const LogLine& line) {
   switch (line.meaning) {
     case LogMeaning::kNotSigned:
@@ -133,8 +133,8 @@ void Reader::ReadError(const LogLine& line) {
       record_.has_no_key_path = true;
       return;
     case LogMeaning::kRegistrationFailed:
-      // Normally the last "register" event reports this failure. The log line is kept only if there
-      // is no such event, or if it reports success.
+      // Normally the last "register" event reports this failure. The log line becomes a separate
+      // error only if that event reports success, or if there is no "register" event.
       if (record_.registrations.empty() ||
           IsZuSuccess(static_cast<int>(record_.registrations.back().result))) {
         record_.other_errors.push_back(line.whole);
@@ -164,10 +164,10 @@ void Reader::ReadVerify(const json& event) {
   record_.verify_error = IsSuccess(event) ? 0 : std::max<int64_t>(NumberOf(event, "errno"), 1);
 }
 
-// True if the kernel is asked about the file itself. While the tool signs libraries or the file,
-// the step decides. At other times the tool makes no request to the kernel, but a program other
-// than the tool (--tool) can make one. The path then decides, and an empty path counts as the file
-// itself.
+// True if an attempt to sign `path`, or a request to the kernel about `path`, is for the file
+// itself, not for a library. While the tool signs libraries or the file, the step decides. At other
+// times the tool makes no request to the kernel, but a program other than the tool (--tool) can
+// make a request. `path` then decides, and an empty path counts as the file itself.
 bool Reader::IsOwn(const std::string& path) const {
   if (step_ == Step::kLibraries || step_ == Step::kFile) return step_ == Step::kFile;
   return path.empty() || path == record_.PathForTool();

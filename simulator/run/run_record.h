@@ -1,6 +1,7 @@
-// A run of the tool for one file: its events, and what they report about the file, its libraries
-// and its key. TakeApart fills a RunRecord from the journal's events, except the members from
-// `failure` on, which the journal does not have.
+// The record of a run of the tool for one file: the events of the run, and what the events report
+// about the file, the file's libraries and the signer's key. TakeApart makes a RunRecord from the
+// journal's events. TakeApart does not set `failure` or the members after `failure`, because the
+// journal does not have these facts.
 #pragma once
 
 #include <cstdint>
@@ -29,8 +30,8 @@ struct Attempt {
   Outcome outcome = Outcome::kBegun;
   int64_t error = 0;                      // the errno of the kernel's refusal or of the failed open
   std::string payload;                    // the bytes that the kernel got, in hexadecimal
-  std::optional<std::string> integrity;   // the tool's integrity value, as read last; none: no file
-  LogMeaning why = LogMeaning::kUnknown;  // the first error logged before the refusal, if any
+  std::optional<std::string> integrity;   // last read integrity value; none: not read, or no file
+  LogMeaning why = LogMeaning::kUnknown;  // the first error about a refused library, if any
 };
 
 // Why a run has no result for the file.
@@ -52,8 +53,8 @@ struct Failure {
 
 // Which tool ran.
 struct ToolIdentity {
-  bool is_own = false;  // the tool beside the simulator, which has the simulator's version
-  std::string sha256;   // of its bytes, in lower-case hexadecimal; empty: they cannot be read
+  bool is_own = false;  // the tool in the simulator's own directory; has the simulator's version
+  std::string sha256;   // of the tool's bytes, in lower-case hexadecimal; empty: not readable
 };
 
 struct RunRecord {
@@ -61,13 +62,13 @@ struct RunRecord {
   std::string file;
   std::string path;
   std::string installed;  // <install>/base.apk, made by Installation; empty: not made
-  bool is_silent = true;  // the journal has no event of the tool before its exit
+  bool is_silent = true;  // the journal has no event of the tool, except "exit"
 
   std::vector<LogLine> opening_errors;  // logged before the tool began to sign
   bool is_dex_refused = false;
-  LogMeaning dex_why = LogMeaning::kUnknown;  // the first error logged before the refusal, if any
-  std::vector<Attempt> libraries;             // in order
-  std::optional<Attempt> own;                 // the file itself; none: no attempt with a result
+  LogMeaning dex_why = LogMeaning::kUnknown;  // the first error about the dex file, if any
+  std::vector<Attempt> libraries;             // in the order of the events
+  std::optional<Attempt> own;                 // for the file itself; none: no attempt with a result
   std::optional<int64_t> verify_error;        // a plain JAR: 0 if the kernel trusts it, else errno
   bool is_jar = false;
 

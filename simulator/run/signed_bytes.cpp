@@ -22,7 +22,8 @@ bool IsRegular(const std::string& path, struct stat* state) {
   return stat(path.c_str(), state) == 0 && S_ISREG(state->st_mode);
 }
 
-// Returns an empty text if the file cannot be read before the deadline.
+// Returns the file's SHA-256 digest in lower-case hexadecimal. Returns an empty text if the file is
+// not regular, or cannot be read to its end before the deadline.
 std::string DigestOf(const std::string& path, const Deadline& deadline) {
   struct stat state = {};
   if (!IsRegular(path, &state)) return {};
@@ -63,7 +64,7 @@ bool SignedBytes::Holds(const std::string& path, const Deadline& deadline) {
 
 bool SignedBytes::Add(const std::string& path, const Deadline& deadline) {
   struct stat state = {};
-  if (!IsRegular(path, &state)) return true;  // gone since it was signed: nothing is left to trust
+  if (!IsRegular(path, &state)) return true;  // no regular file is left to trust
   if (directory_.empty()) {
     if (shares_) seen_.push_back({path, state, ""});
     return true;

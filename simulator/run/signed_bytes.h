@@ -21,7 +21,8 @@ class SignedBytes {
  public:
   // Load() creates `directory` if it does not exist. If `directory` is empty, nothing is kept after
   // this object is destroyed. If `shares` is false, added files are not trusted in this run, so
-  // that the order of its files does not matter. In this case several threads may use the object.
+  // that the order of the run's files does not matter. If `shares` is false, several threads may
+  // use the object after Load().
   SignedBytes(std::string directory, bool shares)
       : directory_(std::move(directory)), shares_(shares) {}
 
@@ -29,12 +30,13 @@ class SignedBytes {
   bool Load();
 
   // True if the file at `path` has bytes that were signed. False for a file that is not regular.
-  // Also false if the file must be digested, but cannot be read before the deadline.
+  // Also false if the file must be digested, but cannot be read before the deadline. Without a
+  // directory, also false if the signed file changed before this object digested that file.
   bool Holds(const std::string& path, const Deadline& deadline);
 
-  // Remembers the present bytes of the file at `path`. Returns false if the file cannot be digested
-  // before the deadline, or if the digest cannot be written. Exception: returns true if the file is
-  // gone or cannot be read.
+  // Remembers the present bytes of the file at `path`. With a directory, returns false if the
+  // deadline passes before an existing file is digested, or if the digest cannot be written. In all
+  // other cases, returns true, also if the file is gone or cannot be read.
   bool Add(const std::string& path, const Deadline& deadline);
 
  private:

@@ -26,8 +26,8 @@ namespace fs = std::filesystem;
 // Why the last system call failed, as the end of a message.
 std::string ErrnoText() { return std::string(": ") + strerrordesc_np(errno); }
 
-// The file's absolute path without symbolic links. If they cannot be resolved, only its absolute
-// path.
+// The file's absolute path without symbolic links. If the path cannot be resolved, the absolute
+// path with its symbolic links.
 std::string Resolved(const std::string& file) {
   std::error_code error;
   const fs::path path = fs::canonical(file, error);
@@ -45,8 +45,8 @@ std::string OwnDescriptorPath(int fd) {
 }
 
 // The result for a name for which the tool is not run (ListedFile::State): a directory without
-// packages, an unreadable directory, or an unreadable entry of a directory. The result contains
-// only this reason.
+// packages, an unreadable directory, or an unreadable entry of a directory. The result has only the
+// name, the path, and the reason why the tool is not run.
 FileRun RunOfDirectory(const ListedFile& directory) {
   FileRun run;
   const std::string path = Resolved(directory.name);
@@ -70,7 +70,7 @@ std::string ContentOf(int fd) {
 struct Simulator::Task {
   const Deadline deadline;
   const ScopedFd journal;
-  std::string path;  // of the file for the tool, resolved
+  std::string path;  // the resolved path of the file on which the tool is run
   Failure failure;
 };
 
@@ -123,7 +123,7 @@ FileRun Simulator::Run(const ListedFile& listed) {
   return run;
 }
 
-// Runs the tool, and records in the journal how it ended.
+// Runs the tool. If the tool started, records in the journal how the tool ended.
 void Simulator::RunToolFor(const std::string& file, Task* task) {
   const PhoneSettings phone = PhoneFor(*task);
   if (task->deadline.HasPassed()) return Fail(Failure::Kind::kTimedOut, "", task);

@@ -22,10 +22,10 @@ struct RunOptions {
   std::vector<std::string> trust;  // existing files that the kernel trusts
   std::string state;               // the directory for --state; an empty text: none
   InstallWhen install = InstallWhen::kAlone;
-  InstalledAbi abi = InstalledAbi::kPreferred;  // whose libraries are extracted
-  unsigned jobs = 1;                            // how many files at a time
+  InstalledAbi abi = InstalledAbi::kPreferred;  // the processors whose libraries are laid out
+  unsigned jobs = 1;                            // the greatest number of simultaneous runs
   std::string tool;                             // the program that is run
-  bool is_own_tool = false;                     // `tool` is the one beside this program
+  bool is_own_tool = false;                     // `tool` is from the simulator's own directory
   std::vector<std::string> runner;              // put before the tool: an emulator with its options
   double timeout = 30;                          // seconds, for each file
 };
@@ -33,27 +33,27 @@ struct RunOptions {
 // The results of one run. MakeReport judges them.
 struct FileRun {
   RunRecord record;
-  PackageFacts facts;   // of the file that the tool was given, which may be in an Installation
-  std::string journal;  // the lines of this run, from "start" to "exit"
+  PackageFacts facts;  // of the file that the tool was given, which may be in an Installation
+  // The lines of this run, from "start" on. If the tool started, the last line is "exit".
+  std::string journal;
 };
 
 class Simulator {
  public:
   Simulator(const RunOptions& options, bool has_standard_input);
 
-  // Opens the state directory and looks for the tool and the kernel stand-in, the library that
-  // answers in place of the kernel. Returns none if the simulation can begin, else the reason why
-  // it cannot.
+  // Opens the state directory. Looks for the tool and for the kernel stand-in, which is the library
+  // that answers in place of the kernel. Returns none on success, else the reason of the failure.
   std::optional<std::string> Prepare();
 
-  // Runs the tool for `file` if the state of `file` is kToRun. If the run fails, record.failure has
-  // the reason. For any other state, the result has only the file's name and path, and the reason
-  // why the tool was not run. If `jobs` is more than 1, several threads may call this function at
-  // the same time.
+  // Runs the tool for `file` if file.state is kToRun. If the run fails, record.failure has the
+  // reason. If file.state is not kToRun, the result has only the file's name and path, and the
+  // reason why the tool was not run. If RunOptions::jobs is more than 1, several threads may call
+  // Run() at the same time.
   FileRun Run(const ListedFile& file);
 
  private:
-  // One run in progress: its time limit, journal and path, and why it failed.
+  // A run in progress: the time limit, the journal, the file's path, and the reason of a failure.
   struct Task;
 
   void RunToolFor(const std::string& file, Task* task);

@@ -74,8 +74,9 @@ Words EnvironmentWith(const Words& assignments) {
   return environment;
 }
 
-// Returns 0, or the errno of the failure to start the child. The child gets only the standard
-// streams, so that the tool's first file is descriptor 3, as on a phone.
+// Returns 0, or the errno of the failure to start the child. The child gets no descriptors except
+// the standard streams. If all three streams are open, the tool's first file gets descriptor 3, as
+// on a phone.
 int Spawn(Words words, Words environment, pid_t* child) {
   posix_spawn_file_actions_t actions;
   posix_spawn_file_actions_init(&actions);

@@ -83,7 +83,7 @@ size_t Junit::Count(Outcome outcome) const {
 namespace {
 
 // Returns two lines for each refused item and each warning: the fact, and below it what to do. If
-// the installer's verifier is missing, one line says so.
+// the installer's verifier is missing, one more line reports this fact.
 std::string DetailText(const Report& report) {
   std::string text;
   const auto add = [&text](const std::string& line, const Reason& reason) {

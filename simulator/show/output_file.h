@@ -1,6 +1,6 @@
 // An output file that the command line names: the journal, the page, or a report for another
-// program. An existing regular file is replaced only if it is empty, or if it begins like a file of
-// the kind that replaces it.
+// program. An existing regular file is replaced only if it is empty, or if it begins with the first
+// bytes of the new file's kind (OutputKind::start).
 #pragma once
 
 #include <optional>
@@ -34,14 +34,15 @@ class OutputFile {
   // pipes.
   bool IsSameAs(const OutputFile& other) const;
 
-  // Opens and empties the file. Returns false, with errno set, if it cannot be written.
+  // Opens and empties the file, or creates it. Returns false, with errno set, if the file
+  // cannot be written.
   bool Open();
   bool IsOpen() const { return file_ && file_->get() >= 0; }
   void Close() { file_.reset(); }
   // Appends `text`. Returns false, with errno set, if it cannot be written.
   bool Append(std::string_view text) const;
-  // The message for the user after a failure of Open or Append. Call it directly after the failure,
-  // because it uses errno.
+  // The message for the user after a failure of Open or Append. Call ErrorText directly after the
+  // failure, because it uses errno.
   std::string ErrorText() const;
 
  private:

@@ -101,8 +101,8 @@ data FileFields(const Report& report, size_t number, const PageRun& run) {
   return file;
 }
 
-// Each long part is cut before the parts are joined. Otherwise a long name could cut off the key
-// that follows it.
+// Each long part is cut before the parts are joined. If the joined text were cut, the key after a
+// long name could be lost.
 list HeadLines(const Report& report) {
   Report head;
   head.package_name = Short(report.package_name);
@@ -169,7 +169,7 @@ void AddPicture(const Report& report, data* file) {
 void AddSigners(const Report& report, data* file) {
   struct Signer {
     std::vector<std::string> schemes;
-    std::string certificate;  // its digest
+    std::string certificate;  // the certificate's SHA-256 digest; may be empty
     Rows rows;
   };
   std::vector<Signer> signers;
@@ -231,7 +231,8 @@ list FactRows(const Report& report, const PageRun& run) {
   return shown;
 }
 
-// The tool does not report its version. The tool of the same build has the simulator's version.
+// The tool does not report its version. Without --tool, the simulator runs the tool of its own
+// build, which has the simulator's version.
 std::string ToolText(const PageRun& run) {
   if (run.tool.empty()) return "apktoolkit " APKTOOLKIT_VERSION;
   return Short(run.tool) + " (--tool; its version is not known)";

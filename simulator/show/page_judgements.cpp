@@ -15,8 +15,8 @@ using kainjow::mustache::data;
 using kainjow::mustache::list;
 using kainjow::mustache::object;
 
-// A row of the table: the judgement of the tool, or of the phones of some API levels. Each line of
-// a cell is shortened separately.
+// A row of the table: the judgement of the tool or of the phones of some API levels, or why there
+// is no judgement of phones. Each text of `signers` and `why` becomes a line of its cell.
 struct Said {
   std::string who;
   Mark mark;
@@ -108,7 +108,7 @@ Said ByNobody(const Judgement& judgement) {
   return said;
 }
 
-// The same form as for the tool's signer: "CN=Vault, RSA-2048, key 98302ce8…f64646".
+// Returns the text of SignerText, such as "CN=Vault, RSA-2048, key 98302ce8…f64646".
 std::string SignerOf(const InstallerSigner& signer) {
   Report of_signer;
   of_signer.signer = signer.certificate;

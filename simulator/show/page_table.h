@@ -1,5 +1,5 @@
-// The page's table of files, the worst first. The reader can choose which files it shows. The
-// directory that all files have in common is shown once, in the caption.
+// The page's table of files, the worst first. The reader can choose which files the table shows. If
+// all files have a common directory other than "/", only the table's caption shows this directory.
 #pragma once
 
 #include <kainjow/mustache.hpp>

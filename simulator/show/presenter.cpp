@@ -136,14 +136,16 @@ int Presenter::Finish(const std::vector<std::string>& files) {
   return EndWith(status_);
 }
 
-// The number of files that the run did not reach; none if the run was not interrupted.
+// The number of files that were not shown because of an interruption. Returns none if all files
+// were shown, and no shown report has the cause kInterrupted.
 std::optional<size_t> Presenter::Unseen() const {
   const size_t unseen = file_count_ - shown_;
   if (unseen == 0 && !is_interrupted_) return std::nullopt;
   return unseen;
 }
 
-// Overwrites all outputs of an earlier run. Otherwise they would look like outputs of this run.
+// Overwrites every output file. An output file of an earlier run would otherwise look like an
+// output of this run.
 int Presenter::GiveUp(const std::vector<std::string>& files, const std::string& problem) {
   status_ = Complain(kCannotSimulate, problem);
   for (OutputFile* const file : AllFiles()) {

@@ -9,8 +9,8 @@ namespace simulator {
 
 namespace {
 
-// Returns the bytes of the file that belong to no entry. Overlapping entries can together have more
-// bytes than the file. The result is then 0.
+// Returns the number of bytes in the file that belong to no entry. Overlapping entries can together
+// have more bytes than the file. The number is then 0.
 Share Between(const Protection& protection, uint64_t file_size) {
   uint64_t rest = file_size;
   for (const Share* share : {&protection.verified, &protection.vouched, &protection.differing,
@@ -23,7 +23,7 @@ Share Between(const Protection& protection, uint64_t file_size) {
 }  // namespace
 
 std::vector<DrawnPart> DrawBar(const Protection& protection, uint64_t file_size) {
-  constexpr double kLeast = 0.75;  // percent of the width, for each part that is not empty
+  constexpr double kLeast = 0.75;  // percent of the bar's width, for each part that has bytes
   std::vector<DrawnPart> parts = {
       {"verified", kVerifiedWord, "dex and native libraries, compared with the manifest", true,
        protection.verified, 0, 0, 0},
@@ -47,7 +47,7 @@ std::vector<DrawnPart> DrawBar(const Protection& protection, uint64_t file_size)
        protection.signature, 0, 0, 0},
       {"between", "between the entries", "headers, directory, padding, newer signing block", false,
        Between(protection, file_size), 0, 0, 0}};
-  // The parts that stand for a fault are drawn only if the package has this fault.
+  // A part that stands for a fault is drawn only if the package has this fault.
   parts.erase(
       std::remove_if(parts.begin(), parts.end(),
                      [](const DrawnPart& part) {

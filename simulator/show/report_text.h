@@ -1,5 +1,5 @@
-// A report for a person: the verdict, a line for each thing that was to be signed, what to do, who
-// signed, and the timeline.
+// Prints a report for a person: the verdict, the items with their cures, the warnings, the signer
+// and the timeline. Detail::kVerdict prints only the verdict's line.
 #pragma once
 
 #include <ostream>

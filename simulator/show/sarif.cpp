@@ -38,9 +38,9 @@ void Sarif::Add(const Report& report) {
   const size_t index = AddArtifact(report);
   const Json location = {{"physicalLocation",
                           {{"artifactLocation", {{"uri", UriOf(report.file)}, {"index", index}}}}}};
-  // A refusal that follows from another refusal gets no result, because the result of that other
-  // refusal says what to fix. The exception is a report that has only such refusals. Each of them
-  // then gets a result, so that every refused file has at least one.
+  // A refused item of severity kFollows gets no result if the report also has a refused item of
+  // another severity. The result of that other item says what to fix. If all refused items have the
+  // severity kFollows, each gets a result, because a refused file must have at least one result.
   const bool has_origin =
       std::any_of(report.items.begin(), report.items.end(),
                   [](const Item& item) { return IsRefused(item) && !Follows(item); });
@@ -83,7 +83,8 @@ std::string Sarif::Log() const {
   return TextOf(log, kIndent) + "\n";
 }
 
-// Adds the file, unless the log already has it with the same bytes. Returns its index.
+// Adds an artifact for the file, unless the log already has an artifact with the same path and
+// digest. Returns the index of the file's artifact.
 size_t Sarif::AddArtifact(const Report& report) {
   Json artifact = {{"location", {{"uri", UriOf(report.file)}}},
                    {"roles", Json::array({"analysisTarget"})}};

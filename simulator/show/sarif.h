@@ -1,9 +1,12 @@
-// The report of a run for programs that read results of static analysis: one SARIF log (OASIS
-// Static Analysis Results Interchange Format, version 2.1.0). Each refused item is a result of
-// level "error", unless it only follows from another refused item of the report. Each warning is a
-// result of level "warning". The rules are the causes (simulator/verdict/causes.h). A file that was
-// not looked at, or not simulated, is a notification of level "error", and the run then counts as
-// not successful. All texts from a file are escaped.
+// The report of a run as one SARIF log (OASIS Static Analysis Results Interchange Format, version
+// 2.1.0), for programs that read results of static analysis. Each refused item of a file is a
+// result of level "error". An item that is refused only because of another cause
+// (Severity::kFollows) is left out if the file also has a refused item of another severity. Each
+// warning is a result of level "warning". The rules are the causes of the results
+// (simulator/verdict/causes.h). A file that was not looked at, or not simulated, is a notification
+// of level "error", and the run then counts as not successful. In messages, hidden characters
+// (IsHidden in simulator/phone/text.h) and bytes that are not UTF-8 become \xNN. In URIs, paths are
+// percent-encoded.
 #pragma once
 
 #include <map>
@@ -29,7 +32,7 @@ inline constexpr std::string_view kSarifStart =
 
 class Sarif {
  public:
-  // Adds the next file, in the order of the command line.
+  // Adds the report of one file. Must be called in the order of the files on the command line.
   void Add(const Report& report);
 
   // Adds a failure of the run itself, for example that the journal cannot be written.

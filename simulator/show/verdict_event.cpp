@@ -67,9 +67,9 @@ std::string SignerJson(const std::string& scheme, const CertificateFacts& signer
   return Object(members);
 }
 
-// For the JAR signer ("v1"), the report's key has precedence over the key that libcrypto finds in
-// the certificate. The report's key is the key that the kernel got or, if the kernel got none, the
-// key that the tool reads.
+// For the JAR signer ("v1"), `modulus_sha256` is the digest that the kernel got. If the kernel got
+// none, it is the digest of the modulus that the tool reads. If the tool reads none, it is the
+// digest of the modulus that libcrypto finds in the certificate.
 std::string SignersJson(const Report& report) {
   std::vector<std::string> signers;
   if (report.signer || report.key) {
@@ -101,8 +101,8 @@ std::string NamesJson(const std::vector<std::string>& names) {
   return List(names, [](const std::string& name) { return EncodeText(name); });
 }
 
-// The result of comparing the entries with the manifest, and the number of entries that the tool
-// looked at.
+// The entries, divided by the result of their comparison with the manifest. `looked_at` is the
+// number of matching or differing entries that the tool itself checked.
 std::string EntriesJson(const Protection& all) {
   const auto share = [](const Share& counted, Members members) {
     members.insert(members.begin(), {{"entries", std::to_string(counted.entries)},
@@ -160,7 +160,8 @@ std::string RangeJson(const RangeJudgement& range) {
   return Object(members);
 }
 
-// The tool beside the simulator is of the same build, so it has the simulator's version.
+// Only the tool beside the simulator has a known version. One build makes the tool and the
+// simulator, so their versions are equal.
 std::string ToolJson(const ToolIdentity& tool) {
   Members members = {{"sha256", EncodeText(tool.sha256)}};
   if (tool.is_own) members.emplace_back("version", EncodeText(APKTOOLKIT_VERSION));

@@ -1,4 +1,4 @@
-// The last event of a file in the journal: its report as one line (docs/journal.md).
+// The last event of a file in the journal: the file's report as one line (docs/journal.md).
 #pragma once
 
 #include <string>

@@ -1,5 +1,5 @@
-// The words of a report, for all outputs. They contain names and details from the files, unchanged.
-// The caller must escape them.
+// The words and texts of a report, for all outputs. The texts can contain names and details from
+// the files, unchanged. The caller must escape each text for its output.
 #pragma once
 
 #include <optional>
@@ -18,8 +18,8 @@ enum class Mood { kGood, kMixed, kBad };
 struct VerdictWords {
   const char* code;  // for programs
   const char* word;
-  const char* one;  // in the summary, after a number
-  const char* many;
+  const char* one;   // in the summary, after the number 1
+  const char* many;  // in the summary, after any other number
   Mood mood;
 };
 
@@ -33,18 +33,18 @@ const char* MoodCode(Mood mood);
 // number if it is not 0.
 std::string Summary(const std::vector<Verdict>& verdicts, std::optional<size_t> unseen = {});
 
-// The package's name, its JAR signer and key, and the text of OtherOwnerText. `ellipsis` replaces
-// the middle of a digest.
+// The package's name, SignerText, and OtherOwnerText. Facts that the report does not have are left
+// out. `ellipsis` replaces the middle of a digest.
 std::vector<std::string> OwnerFacts(const Report& report, const char* ellipsis);
 
 // The JAR signer and the key, such as "CN=Vault, RSA-2048, key 98302ce8…f64646".
 std::string SignerText(const Report& report, const char* ellipsis);
 
-// Names the signer whom phones record as the package's signer, if this is not the JAR signer. Empty
-// unless the verdict is kOtherSigner.
+// If the verdict is kOtherSigner, names the signer that phones record for the package. Empty for
+// any other verdict.
 std::string OtherOwnerText(const Report& report);
 
-// The texts of the warnings that have the severity kAlarm.
+// The texts of the warnings that have the severity kAlarm, each with "! " before it.
 std::vector<std::string> AlarmFacts(const Report& report);
 
 // The reason of the item that decides the verdict; empty if nothing was refused.
@@ -54,12 +54,14 @@ std::string DecisiveReason(const Report& report);
 // returns an empty text.
 std::string MissingInstaller(const Report& report);
 
-// The facts after the file's name in the verdict's line, in this order: the decisive reason or, if
-// nothing was refused, OwnerFacts; the gate's refusals of the signer (gate.h), except the decisive
-// reason; the alarms; the number of all warnings.
+// The facts after the file's name in the verdict's line, in this order:
+// - DecisiveReason, or OwnerFacts if DecisiveReason is empty;
+// - the reasons for which the gate (gate.h) refused the signer, without the decisive reason;
+// - AlarmFacts;
+// - the number of all warnings, unless it is 0.
 std::vector<std::string> HeadFacts(const Report& report, const char* ellipsis);
 
-// The mark before a line.
+// The mark before the line of an item or of a link.
 enum class Mark { kGood, kBad, kNeither };
 
 Mark MarkOf(ItemState state);
@@ -68,12 +70,13 @@ Mark MarkOf(LinkState state);
 // "good", "bad" or "neither", for programs.
 const char* MarkCode(Mark mark);
 
-// "✓", "✗" and "–", or "+", "x" and "-" where these cannot be shown.
+// Returns "✓", "✗" or "–" if `has_utf8` is true, else "+", "x" or "-".
 const char* SymbolOf(Mark mark, bool has_utf8);
 
 std::string NameOf(const Item& item);
 
-// The item's result and its reason. `verdict` is the report's verdict.
+// The text after the item's name: the item's result, its reason, or both. `verdict` is the report's
+// verdict.
 std::string OutcomeOf(const Item& item, Verdict verdict);
 
 // The path at which the tool found the file.
@@ -85,23 +88,25 @@ inline const std::string& PathForTool(const Report& report) {
 inline constexpr char kLaidOutText[] =
     "its libraries were extracted beside it, as an installer does; --install=no turns this off";
 
-// True if the cure, which says what to do, is shown below the item. It is not shown if nothing is
-// wrong, or for a consequence of another cause. If consecutive items have the same cause, only the
-// last of these items shows the cure. `next` is the next item, or null.
+// True if the item's cure (the text that says what to do) is shown below the item. No cure is shown
+// if nothing is wrong, or if the item's reason is a consequence of another cause. If consecutive
+// items have the same cause, only the last of these items shows the cure. `next` is the next item,
+// or null.
 bool HasCure(const Item& item, const Item* next);
 
-// The link's text, or "not reached" for each link after a broken one.
+// The link's text, or "not reached" for each link after a broken link.
 std::string TextOf(const Link& link);
 
-// Label and value for each fact. Except for the modulus, the labels are those of apksigner. One
-// search then finds a fact in the outputs of both programs.
+// Label and value for each fact. The labels are those of apksigner, except the label of the
+// modulus. A user can therefore search for the same label in the output of apksigner.
 using Rows = std::vector<std::pair<std::string, std::string>>;
 // The facts of a certificate, as libcrypto reads it. The tool has its own parser.
 Rows CertificateRows(const CertificateFacts& certificate);
-// The facts of the JAR signature: its certificate, and the digest of the key for the kernel.
+// The facts of the JAR signer: the certificate, and the digest of the key that the kernel got or
+// that the tool would send.
 Rows SignerRows(const Report& report);
 
-// The words for a share of the package.
+// The words for the parts of the package in Protection (simulator/verdict/report.h).
 inline constexpr char kVerifiedWord[] = "verified";
 inline constexpr char kVouchedWord[] = "listed and not verified";
 inline constexpr char kDifferingWord[] = "other than listed";

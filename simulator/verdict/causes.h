@@ -25,7 +25,7 @@ enum class Group {
 enum class Severity {
   kFailed,   // there is no result for the file
   kUnseen,   // the tool left the file alone
-  kRefused,  // not signed, registered, installed or accepted, but it should have been
+  kRefused,  // not signed, registered, installed or accepted, but should have been
   kFollows,  // like kRefused, but only because of another cause, which must be fixed first
   kAbsent,   // there is nothing to sign; a refusal under --strict
   kNothing,  // there is nothing to sign
@@ -43,13 +43,13 @@ struct Cause {
   Severity severity;
   ChainLink link;      // the link that the cause breaks; kNone: it breaks none
   const char* log;     // the messages that show the cause in the log, for docs/messages.md
-  const char* reason;  // the end of a sentence such as "not signed: …"; "%s" is replaced
+  const char* reason;  // the end of a sentence such as "not signed: …"; "%s" becomes Reason::detail
   const char* cure;    // one or more sentences
 };
 
 namespace cause {
 
-// The rows fill each line up to its full length. clang-format would wrap them in another way.
+// The rows are wrapped by hand. clang-format would make this table twice as long.
 // clang-format off
 
 // ---- The tool did not look at the file.

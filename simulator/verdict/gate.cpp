@@ -132,8 +132,8 @@ void Refuse(ItemKind kind, const char* name, const Reason& reason, Report* repor
   if (StatusOf(report->verdict) == kAllSigned) report->verdict = Verdict::kNotAccepted;
 }
 
-// The JAR signer, with the key that the kernel got or would get. The certificate of the report
-// counts only if it contains this key.
+// The JAR signer. modulus_sha256 is the digest that the kernel got, or that the tool would send.
+// The other facts are those of report.signer if its modulus has this digest, and empty otherwise.
 CertificateFacts JarSigner(const Report& report) {
   CertificateFacts signer;
   const std::string modulus = report.key ? report.key->sha256 : "";
@@ -153,9 +153,9 @@ std::vector<const CertificateFacts*> NewestSigners(const RangeJudgement& range) 
   return signers;
 }
 
-// The signers for whom any of the phones installs the package, each once, in a fixed order. If the
-// installer did not judge the package, these are the signers of the newest scheme in the file. If
-// the file has only v1, this is the JAR signer.
+// The signers for whom phones of any API level install the package, each once, in a fixed order. If
+// the installer did not judge the package: the signers of the newest scheme in the file, or the JAR
+// signer if the file has no scheme after v1.
 Signers InstalledSigners(const Report& report) {
   Signers signers;
   for (const RangeJudgement& range : report.installer.ranges) {
@@ -193,7 +193,8 @@ bool IsOneOf(const std::vector<std::string>& digests, const CertificateFacts& si
   });
 }
 
-// The kernel knows a signer by the key, and phones know a signer by the certificate.
+// The kernel identifies a signer by the key, and the installer identifies a signer by the
+// certificate. Two signers are the same only if their keys and their certificates are equal.
 bool AreSameSigner(const CertificateFacts& one, const CertificateFacts& other) {
   return one.sha256 == other.sha256 && one.key.modulus_sha256 == other.key.modulus_sha256;
 }

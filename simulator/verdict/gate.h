@@ -13,7 +13,8 @@ namespace simulator {
 
 struct GateOptions {
   // The expected signers; empty: any signer is allowed. Each is the SHA-256 digest of a
-  // certificate, of its SubjectPublicKeyInfo or of its RSA modulus, in the form of ReadDigest.
+  // certificate, of its SubjectPublicKeyInfo or of its RSA modulus, in the form that ReadDigest
+  // returns.
   std::vector<std::string> signers;
   bool refuses_warnings = false;
 };
@@ -30,14 +31,14 @@ class Gate {
 
   // Adds at least one item to the report for each demand that the file does not meet. A good
   // verdict then becomes kNotAccepted. The demand for no warnings is made only if the verdict was
-  // good when Judge was called. The verdict kOtherSigner then counts as a warning. Changes nothing
-  // for a file that was not looked at or not simulated. Called once per file, in the order of the
-  // command line, because each verified package is compared with the first one that has the same
-  // package name.
+  // good when Judge was called. For this demand, the verdict kOtherSigner is a warning. Changes
+  // nothing for a file that was not looked at or not simulated. Must be called once per file, in
+  // the order of the command line, because each verified package is compared with the first
+  // verified package of the same name.
   void Judge(Report* report);
 
  private:
-  // For one package name: the signers of the first file that has it.
+  // The first verified package of a package name, and its signers.
   struct First {
     std::string file;
     CertificateFacts jar;

@@ -1,4 +1,5 @@
-// The item of a report for the judgement of the phones' installer.
+// The report's item about the judgement of the phones' installer, and other results from this
+// judgement.
 #include <algorithm>
 
 #include "simulator/verdict/parts.h"
@@ -49,8 +50,9 @@ std::string TakersText(const Judgement& judgement) {
          Joined(schemes);
 }
 
-// Phones verify only the newest of the package's schemes that they know. All signers of that scheme
-// count. The last range that installs the package decides, because it has the newest phones.
+// Phones verify only the newest of the package's signature schemes that they know. Therefore only
+// the signers of the newest scheme are compared with the JAR signer. The last range that installs
+// the package decides, because this range contains the newest phones.
 const CertificateFacts* OtherSigner(const Judgement& judgement, const Report& report) {
   const CertificateFacts* other = nullptr;
   for (const RangeJudgement& range : judgement.ranges) {
@@ -66,8 +68,8 @@ const CertificateFacts* OtherSigner(const Judgement& judgement, const Report& re
 
 namespace {
 
-// The API levels of the phones that install the package, or of the phones that refuse it: "API 27
-// to 29".
+// The API levels of the phones that install the package, such as "API 27 to 29". If `is_verified`
+// is false, the API levels of the phones that refuse the package.
 std::string LevelsText(const std::vector<RangeJudgement>& ranges, bool is_verified) {
   std::vector<LevelRange> levels;
   for (const RangeJudgement& range : ranges) {
@@ -85,9 +87,9 @@ std::string LevelsText(const std::vector<RangeJudgement>& ranges, bool is_verifi
   return Joined(texts);
 }
 
-// Sentences for the most frequent faults. "%s" is replaced by the issue's parameter with the index
-// `parameter`, such as the entry's name. All other faults, and faults without this parameter, are
-// reported in apksig's own sentence.
+// Sentences for the most frequent errors of apksig. "%s" is replaced by the issue's parameter with
+// the index `parameter`, such as an entry's name. apksig's own sentence reports all other errors,
+// and errors that lack the parameter for "%s".
 constexpr struct {
   const char* issue;
   size_t parameter;

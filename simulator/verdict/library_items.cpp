@@ -27,7 +27,8 @@ Reason WhyNotThere(const LibraryFacts& library, const RunRecord& run, const Pack
 void AddLibraryItems(const RunRecord& run, const PackageFacts& facts, const JudgeOptions& options,
                      std::vector<Item>* items) {
   const bool is_walked = run.own || !run.libraries.empty();
-  // The entries of a plain JAR are not libraries. Each attempt of the tool still gets an item.
+  // Only a package has libraries. If the tool tried to sign libraries of another file, each attempt
+  // still gets an item.
   const bool is_package = items->front().kind == ItemKind::kPackage;
   for (const Library& library :
        MatchAttempts(run, is_package ? facts.libraries : std::vector<LibraryFacts>())) {
@@ -37,7 +38,7 @@ void AddLibraryItems(const RunRecord& run, const PackageFacts& facts, const Judg
     Item item = {ItemKind::kLibrary, name, "", ItemState::kDone, {}};
     if (reason.cause != nullptr) item = NotDone(ItemKind::kLibrary, name, reason, options);
     item.entry = found.entry;
-    // The tool asks the kernel to sign a library only after its bytes matched the manifest.
+    // Each outcome except kNotVerified comes after the library's bytes matched the manifest.
     item.is_verified =
         library.attempt != nullptr && library.attempt->outcome != Attempt::Outcome::kNotVerified;
     items->push_back(item);
@@ -139,7 +140,7 @@ Reason WhyNotThere(const LibraryFacts& library, const RunRecord& run, const Pack
     return {&cause::kLibraryNotOpened, DescribeErrno(error)};
   }
   if (facts.manifest.extracts_libraries == false) return {&cause::kLibraryInPackage, ""};
-  // Installers extract no library to a deeper path than lib/arm64/NAME.
+  // Installers extract no library into a subdirectory of lib/arm64 or lib/arm.
   if (std::count(library.place.begin(), library.place.end(), '/') > 2) {
     return {&cause::kLibraryInSubdirectory, library.place};
   }

@@ -84,8 +84,8 @@ std::string Reason::Text() const {
   return at == std::string::npos ? text : text.replace(at, 2, detail);
 }
 
-// If the installer caused the verdict, only the installer's item counts. Otherwise every item
-// counts. Returns the first refused item that counts.
+// The verdict kNotSimulated has two possible causes. After a failed run, the report has only one
+// item. If the report has more items, the installer's verifier gave up.
 const Item* DecisiveItem(const Report& report) {
   const bool is_installers = report.verdict == Verdict::kNotInstallable ||
                              (report.verdict == Verdict::kNotSimulated && report.items.size() > 1);
@@ -186,9 +186,9 @@ void AddKeyItems(const RunRecord& run, const JudgeOptions& options, std::vector<
   if (run.has_no_key_path) add("", {&cause::kRegistrationNoPath, ""});
 }
 
-// Adds the failures that no other item reports. An error from the opening of the file usually
-// belongs to the file's own item. For a JAR, the error shows only why the file is not a package. If
-// the tool tried to sign a package despite the error, the error is a separate failure.
+// Adds an item for each failure that no other item reports. RunRecord::opening_errors are usually
+// the reason of the file's own item. For a JAR, these errors show only why the file is not a
+// package. If the tool tried to sign a package despite these errors, each of them gets an item.
 void AddToolItems(const RunRecord& run, const JudgeOptions& options, std::vector<Item>* items) {
   const auto add = [&](const Reason& reason) {
     items->push_back(NotDone(ItemKind::kTool, "tool", reason, options));
@@ -204,7 +204,7 @@ void AddToolItems(const RunRecord& run, const JudgeOptions& options, std::vector
   }
 }
 
-// The verdict on the tool's own items alone. The first item is the file itself.
+// The verdict on the tool's own items alone. The first item must be the item for the file itself.
 Verdict Judge(const std::vector<Item>& items) {
   const auto is_refused = [](const Item& item) {
     return item.state == ItemState::kRefused && IsByTool(item);
@@ -218,7 +218,8 @@ Verdict Judge(const std::vector<Item>& items) {
   return is_partly ? Verdict::kPartlySigned : Verdict::kRefused;
 }
 
-// If the tool signed something, the judgement of the phones' installer counts as well.
+// Applies the judgement of the phones' installer to `verdict`. Only kSigned and kPartlySigned can
+// change.
 Verdict JudgeWithInstaller(Verdict verdict, const Report& report) {
   if (verdict != Verdict::kSigned && verdict != Verdict::kPartlySigned) return verdict;
   for (const Item& item : report.items) {
@@ -230,9 +231,10 @@ Verdict JudgeWithInstaller(Verdict verdict, const Report& report) {
   return verdict == Verdict::kSigned && has_other ? Verdict::kOtherSigner : verdict;
 }
 
-// Fills in the payload, the package's name, the signers and the key. The report shows the key whose
-// digest the kernel got with the package, or else with a library. If the kernel signed without such
-// a digest, or did not sign, the report shows the key that the tool's own code reads from the file.
+// Fills in the payload, the package's name, the signers, the schemes and the key. The payload is
+// that of the signed file itself, or else of the first signed library. Only the report of a package
+// can have a key: the key whose digest is in the payload. If the payload has no digest, or if
+// nothing was signed, the report has the key that the tool's own code reads from the package.
 void DescribeSigners(const RunRecord& run, const PackageFacts& facts, Report* report) {
   constexpr char kDigestFollows[] = "2000";  // the digest's length, 32, the low byte first
   const auto take = [report](const Attempt& attempt) {

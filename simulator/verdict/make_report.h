@@ -1,5 +1,5 @@
-// Makes a report from the record of a run and the facts of the file. A pure function: it reads and
-// writes no files.
+// Makes a report from the record of a run, the facts of the file and the judgement of the phones'
+// installer. A pure function: it reads and writes no files.
 #pragma once
 
 #include <cstdint>
@@ -14,7 +14,8 @@ namespace simulator {
 // The user's choices for the judgement.
 struct JudgeOptions {
   bool is_strict = false;  // absent libraries, and damaged or encrypted entries, count as refused
-  // The present time, in seconds since 1970 in UTC. Certificates that ended before it have expired.
+  // The present time, in seconds since 1970 in UTC. A certificate with an earlier notAfter has
+  // expired.
   int64_t now = 0;
 };
 
@@ -22,7 +23,8 @@ struct JudgeOptions {
 Report MakeReport(const RunRecord& run, const PackageFacts& facts, const JudgeOptions& options,
                   const Judgement& installer = {});
 
-// Makes an item that is not kDone. The severity of its cause sets its state.
+// Makes an item that is not kDone. The severity of its cause and `options.is_strict` set its state.
+// The cause must not be null.
 Item NotDone(ItemKind kind, const std::string& name, const Reason& reason,
              const JudgeOptions& options);
 

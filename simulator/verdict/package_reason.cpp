@@ -1,4 +1,4 @@
-// Why a package is refused, or not looked at.
+// Finds the reason why a file was refused, was not looked at, or was taken for a JAR.
 #include <algorithm>
 #include <cerrno>
 
@@ -26,9 +26,10 @@ std::string FirstSignatureFile(const JarSignatureFacts& jar);
 
 }  // namespace
 
-// An encrypted entry is the reason even if the log has an error. Otherwise a refused classes.dex is
-// the reason. Otherwise the first log line that names a failed check decides. The log has the
-// checks in the order in which the tool makes them.
+// The first of these facts decides: an encrypted entry (WhyEncrypted), a refused classes.dex, the
+// first log line that names a failed check. The log has the checks in the order in which the tool
+// makes them. kTextMalformed does not name the malformed file. If no other line names a failed
+// check, this file is the signature file.
 Reason WhyRefused(const RunRecord& run, const PackageFacts& facts) {
   const Lines& errors = run.opening_errors;
   const JarSignatureFacts& jar = facts.jar;
@@ -68,8 +69,8 @@ Reason WhyNotLookedAt(const RunRecord& run, const PackageFacts& facts) {
   return {};
 }
 
-// A classes.dex does not count as a part of a package, because JARs of the platform have one as
-// well. These JARs have neither resources nor libraries.
+// classes.dex does not count as a part of a package, because JARs of the platform also have a
+// classes.dex. These JARs have neither resources nor libraries.
 Reason WhyTakenForAJar(const PackageFacts& facts) {
   std::string part;
   bool has_packages = false;
@@ -103,7 +104,7 @@ Reason WhyDexRefused(LogMeaning why) {
 }
 
 Reason WhyNotOpened(const PackageFacts& facts, int64_t code) {
-  constexpr int64_t kNoEntries = -6;  // the zip library's header has no name for it
+  constexpr int64_t kNoEntries = -6;  // the zip library's header does not name this result
   constexpr const Cause* kCauses[] = {
       nullptr,           &cause::kFolder,     &cause::kSpecialFile, &cause::kEmptyFile,
       &cause::kTextFile, &cause::kCutArchive, &cause::kNoArchive,   nullptr};

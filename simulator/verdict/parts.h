@@ -1,4 +1,4 @@
-// The parts of a report. They are made in package_reason.cpp, library_items.cpp,
+// Functions that make parts of a report. They are defined in package_reason.cpp, library_items.cpp,
 // installer_item.cpp, warnings.cpp and protection.cpp.
 #pragma once
 
@@ -8,30 +8,28 @@
 
 namespace simulator {
 
-// Why the tool refused a whole file before it asked the kernel. The log shows at which step the
-// tool stopped, and the facts of the file show why. The file must be neither signed nor a plain
-// JAR.
+// Why the tool refused a whole file and did not try to sign it. The log shows at which step the
+// tool stopped, and the facts of the file show why. The file must not be a plain JAR.
 Reason WhyRefused(const RunRecord& run, const PackageFacts& facts);
 
-// Why the tool did not look at a file, or was not run for a directory. A null cause if neither
-// applies.
+// Why the tool did not look at a file, or why the simulator did not run the tool for a directory. A
+// null cause if no such reason is known.
 Reason WhyNotLookedAt(const RunRecord& run, const PackageFacts& facts);
 
 // Why an archive without AndroidManifest.xml is probably not meant to be a JAR: it is an app bundle
-// or a set of packages, or has parts of a package. A null cause if the archive has none of these
-// signs.
+// or a set of packages, or has parts of a package. A null cause for every other archive.
 Reason WhyTakenForAJar(const PackageFacts& facts);
 
-// Why the tool refused a file, if an entry that the tool reads is encrypted: an entry of the JAR
-// signature, AndroidManifest.xml or classes.dex. A null cause if none of these is encrypted.
+// Why the tool refused a file, if one of these entries is encrypted: AndroidManifest.xml,
+// classes.dex, or an entry of the JAR signature. A null cause if none of them is encrypted.
 Reason WhyEncrypted(const PackageFacts& facts);
 
-// Why the kernel refused to sign the file, or why the tool did not ask the kernel. A null cause for
-// every other outcome.
+// Why the kernel refused to sign the file of `attempt`, or why the tool's integrity value prevented
+// the request to the kernel. A null cause for every other outcome.
 Reason WhyKernelDidNotSign(const Attempt& attempt);
 
 // Adds an item for each native library of the package, with its result. The first item in `items`
-// must be the file's own.
+// must be the item for the file itself.
 void AddLibraryItems(const RunRecord& run, const PackageFacts& facts, const JudgeOptions& options,
                      std::vector<Item>* items);
 
@@ -40,22 +38,23 @@ void AddLibraryItems(const RunRecord& run, const PackageFacts& facts, const Judg
 void AddInstallerItem(const Judgement& judgement, const JudgeOptions& options,
                       std::vector<Item>* items);
 
-// True if the key is the JAR signer's: the key that the kernel gets and that the certificate shows.
+// True if `key` has the modulus of Report::key and is the key of the certificate Report::signer. If
+// the report lacks one of these members, the function skips the comparison with this member.
 bool IsJarSigner(const PublicKey& key, const Report& report);
 
-// Facts that matter to the user although they change nothing for the kernel. Reads only the items,
-// the signer and the key of the report. Leaves out an exponent or a changed entry that an item
-// already reports. `now` is JudgeOptions::now.
+// The warnings: facts that the user should look at. Reads only three members of `report`: the
+// items, the signer and the key. Leaves out an exponent or a changed entry that an item already
+// reports. `now` is JudgeOptions::now.
 std::vector<Reason> FindWarnings(const RunRecord& run, const PackageFacts& facts,
                                  const Report& report, int64_t now = 0);
 
-// Counts the entries of the package, and their bytes: those that its signature protects, and those
-// that it does not protect. `items` are the items of the report.
+// Shows which entries of the package its signature protects. Counts each entry, and its bytes, in
+// one Share of the result. `items` are the items of the report.
 Protection FindProtection(const PackageFacts& facts, const std::vector<Item>& items);
 
-// Makes the chain from the key to the entries. Looks for the first item, the package or a library,
-// whose cause breaks a link. The chain is broken at this link. All members of the report except the
-// chain must be filled.
+// Makes the chain from the key to the entries. Only the items of the package and its libraries can
+// break a link. The first of these items whose cause has a link (Cause::link) breaks the chain at
+// this link. All members of the report except the chain must be filled.
 std::vector<Link> MakeChain(const PackageFacts& facts, const Report& report);
 
 }  // namespace simulator

@@ -10,8 +10,8 @@ namespace simulator {
 
 namespace {
 
-// The entries that the tool looked at; true if they match the manifest. For a library, the tool
-// looks at the file beside the package.
+// The entries that the tool checked against the manifest. The value is true if the check succeeded.
+// For a library, the tool checks the file beside the package.
 std::map<std::string, bool> EntriesSeen(const std::vector<Item>& items) {
   std::map<std::string, bool> seen;
   for (const Item& item : items) {

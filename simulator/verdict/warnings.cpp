@@ -97,8 +97,9 @@ void WarnOfSigners(const PackageFacts& facts, const Report& report, Reasons* war
   }
 }
 
-// Warns of each use of SHA-1 and MD5 in the JAR signature and in the certificates of all schemes.
-// Collisions of these digests are known.
+// Gives one warning that lists the uses of SHA-1 and MD5 in the JAR signature and in the
+// certificates of all schemes. Collisions of these digests are known. MD5 digests in the manifest
+// and in the signature file are not listed, because the tool accepts no MD5 digests there.
 void WarnOfWeakDigests(const PackageFacts& facts, Reasons* warnings) {
   const auto is_weak = [](const std::string& name) {
     return name.compare(0, 4, "SHA1") == 0 || name.compare(0, 3, "MD5") == 0;
@@ -133,7 +134,7 @@ void WarnOfExpiry(const PackageFacts& facts, int64_t now, Reasons* warnings) {
   }
 }
 
-// The signers' certificates of all schemes, each once. Phones identify a signer by its certificate.
+// The signers' certificates of all schemes, each once.
 std::vector<const CertificateFacts*> Certificates(const PackageFacts& facts) {
   std::vector<const CertificateFacts*> certificates;
   const auto add = [&certificates](const CertificateFacts& certificate) {
@@ -147,7 +148,7 @@ std::vector<const CertificateFacts*> Certificates(const PackageFacts& facts) {
   return certificates;
 }
 
-// One warning for each scheme that has another signer than the JAR signature.
+// One warning for each newer scheme with a signer whose key is not the JAR signer's key.
 void WarnOfOtherKeys(const PackageFacts& facts, const Report& report, Reasons* warnings) {
   if (!report.key && !report.signer) return;
   for (const std::string& scheme : NewerSchemes(facts)) {
@@ -163,8 +164,8 @@ void WarnOfOtherKeys(const PackageFacts& facts, const Report& report, Reasons* w
   }
 }
 
-// The signature file lists the numbers of the package's schemes: "2, 3". Warns of schemes in that
-// list that the package does not have.
+// The signature file can list the numbers of the package's newer schemes: "2, 3". Warns if v2 or v3
+// is in this list, but the package has no signature of that scheme.
 void WarnOfStrippedSchemes(const PackageFacts& facts, Reasons* warnings) {
   const std::vector<std::string> present = NewerSchemes(facts);
   std::vector<std::string> missing;

@@ -31,13 +31,14 @@ inline std::string CountedNames(const std::vector<std::string>& names) {
 // The range in words: "API 27 and later".
 std::string LevelText(const LevelRange& levels);
 
-// Names the phones about which apksig (the platform's verifier) was asked, and the schemes by which
-// they verify the package: "phones of API 27 and later install it, verified by v2, v3". Empty if
-// some of these phones do not install the package, or if apksig gave no judgement.
+// Names the phones about which apksig (the platform's verifier) was asked, and the signature
+// schemes that these phones verify: "phones of API 27 and later install it, verified by v2, v3".
+// Empty if some of these phones do not install the package, or if apksig gave no judgement.
 std::string TakersText(const Judgement& judgement);
 
-// The algorithm and size of the JAR signer's key, such as "RSA-2048". They come from report.key, or
-// from the certificate if report.key is not set. Empty if the report has neither of them.
+// The algorithm and, if known, the size in bits of the JAR signer's key, such as "RSA-2048". Both
+// come from report.key, or from report.signer if report.key is not set. Empty if neither
+// report.key nor report.signer is set.
 inline std::string KeyName(const Report& report) {
   const PublicKey shown = report.signer ? report.signer->key : PublicKey();
   const std::string algorithm = report.key ? "RSA" : shown.algorithm;

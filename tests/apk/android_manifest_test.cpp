@@ -23,7 +23,7 @@ XmlAttribute AndroidValue(const std::string& value) {
   return InAndroidNamespace(StringAttribute("value", value));
 }
 
-// The facts of one document. Reading it must succeed without a message.
+// The facts that the tool reads from one document.
 struct Facts {
   std::string package_name;
   bool ss_permission_required;
@@ -35,6 +35,7 @@ std::ostream& operator<<(std::ostream& out, const Facts& facts) {
   return out << facts.package_name << (facts.ss_permission_required ? " with" : " without");
 }
 
+// Reads the document. The test fails if the tool refuses the document or logs a message.
 Facts Read(const CompiledXml& xml) {
   LogCapture log;
   Apk apk(-1);
@@ -44,7 +45,8 @@ Facts Read(const CompiledXml& xml) {
   return {apk.GetPackageName(), apk.IsSsPermissionRequired()};
 }
 
-// True if the element, inside a manifest, asks for the secure-storage permission.
+// Puts the element into an element "manifest". Returns true if this document asks for the
+// secure-storage permission.
 bool Asks(const std::string& element, const std::vector<XmlAttribute>& attributes) {
   CompiledXml xml;
   xml.Start("manifest", {Package("p")}).Element(element, attributes).End("manifest");
@@ -227,8 +229,8 @@ TEST(AndroidManifestAttribute, StringWithoutTextBeforeAnotherStringIsSkipped) {
             (Facts{"b", false}));
 }
 
-// An attribute's raw value is its text in the source. The typed value was compiled from this text.
-// The raw value is read only if the type of the typed value is string.
+// An attribute's raw value is its text in the XML source. The typed value was compiled from this
+// text. The raw value is read only if the type of the typed value is string.
 TEST(AndroidManifestAttribute, RawTextOfReferenceOrIntegerIsIgnored) {
   for (XmlAttribute attribute :
        {ReferenceAttribute("package", 0x7f010000), IntAttribute("package", 7)}) {
@@ -251,8 +253,8 @@ TEST(AndroidManifestAttribute, LoneStringWithoutTextCountsAsMissing) {
 }
 
 // ---- Unpaired surrogates. The platform drops them when it converts a text to UTF-8. The tool
-// converts only the package's name. All other texts are only compared. If such a text has at most
-// 16 unpaired surrogates, the comparison ignores them, as a conversion would.
+// converts only the package's name. It compares all other texts without a conversion. If a compared
+// text has at most 16 unpaired surrogates, the comparison ignores these surrogates.
 
 const std::string kHigh = "\xED\xA0\x80", kLow = "\xED\xB0\x80";  // U+D800, U+DC00
 
@@ -293,8 +295,8 @@ TEST(AndroidManifestSurrogates, DoNotMakeAShorterNameMatch) {
   EXPECT_EQ(Read(xml), (Facts{"", false}));
 }
 
-// A text with more than 16 unpaired surrogates matches no name. Without this limit, each comparison
-// could read all text of a hostile document.
+// A text with more than 16 unpaired surrogates matches no name. Without this limit, a hostile
+// document could make each comparison read a very long text.
 TEST(AndroidManifestSurrogates, PreventAMatchIfThereAreMoreThan16) {
   for (const size_t count : {16, 17}) {
     CompiledXml xml(CompiledXml::Pool::kUtf16);

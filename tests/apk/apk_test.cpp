@@ -1,5 +1,5 @@
 // Tests Init: the flags that it sets, and the steps that verify a package. Also tests which digest
-// counts if a section of the manifest has two.
+// counts if a section of META-INF/MANIFEST.MF has two digests.
 #include "apk/apk.h"
 
 #include <fcntl.h>
@@ -296,8 +296,8 @@ TEST(ApkInit, PackageWithoutManifestIsNotGoodAndLogsNothing) {
   EXPECT_EQ(StateOf(open.apk), (State{true, true, false, true}));
 }
 
-// META-INF/MANIFEST.MF is read before the signature file and the signature block. If it is missing,
-// nothing is logged about these two entries.
+// The tool extracts META-INF/MANIFEST.MF before the signature file and the signature block. If
+// META-INF/MANIFEST.MF is missing, the tool does not look for the other two entries.
 TEST(ApkInit, PackageWithoutManifestAndBlockLogsNothing) {
   Package package = MakePackage(WithoutDex());
   package.Remove(kManifestName);

@@ -92,8 +92,9 @@ TEST(Base64Decode, TextWithASpaceGivesNoBytes) {
   EXPECT_EQ(Bytes(), Base64Decode("QUJD "));
 }
 
-// Each byte value is appended to a whole group of four characters. An accepted byte is skipped,
-// ends the text, or is a left-over value. Every other byte is refused.
+// Each byte value is appended to four characters that encode three bytes. An accepted byte adds
+// nothing to these three bytes: it is skipped, ends the text, or is a single 6-bit value, which is
+// dropped. Every other byte is refused.
 TEST(Base64Decode, OnlyAlphabetPaddingLineBreaksAndNulAreAccepted) {
   const std::string accepted =
       "ABCDEFGHIJKLMNOPQRSTUVWXYZabcdefghijklmnopqrstuvwxyz0123456789+/=\r\n" + std::string(1, 0);
@@ -106,7 +107,7 @@ TEST(Base64Decode, OnlyAlphabetPaddingLineBreaksAndNulAreAccepted) {
   }
 }
 
-// The alphabet in order: values 0, 1, 2, 3 are 000000 000001 000010 000011, and so on.
+// The text is the alphabet in order, so its 6-bit values are 000000, 000001, 000010, and so on.
 TEST(Base64Decode, AlphabetHasTheValues0To63InOrder) {
   Bytes expected;
   for (int value = 0; value < 64; value += 4) {

@@ -75,7 +75,8 @@ TEST(EntryDigests, LastSectionWithTheNameCounts) {
   EXPECT_EQ("SHA-256-Digest 3", unordered.Of("b"));
 }
 
-// An unstable sort can keep a few equal names in order by chance, but not 50.
+// By chance, an unstable sort can keep a few sections with equal names in order. With 50 sections
+// of each name, this is very unlikely.
 TEST(EntryDigests, LastOf50SectionsWithTheNameCounts) {
   std::string sections = Section("z", "0");
   for (int i = 1; i <= 100; ++i) sections += Section(i % 2 == 0 ? "a" : "b", std::to_string(i));
@@ -88,8 +89,8 @@ TEST(EntryDigests, LastOf50SectionsWithTheNameCounts) {
 // A name of these letters, each followed by 63 slashes.
 //
 // The hash of a name is rotated by 9 bits before each byte. 64 rotations are 576 bits, 9 full turns
-// of the 64-bit hash. Bytes at a distance of 64 therefore enter the hash at the same place, and
-// their order does not change the hash.
+// of the 64-bit hash. Bytes at a distance of 64 are therefore combined with the same bits of the
+// hash, and their order does not change the hash.
 std::string With64Between(const std::string& letters) {
   std::string name;
   for (const char letter : letters) name += letter + std::string(63, '/');
@@ -99,9 +100,10 @@ std::string With64Between(const std::string& letters) {
 // In the first family, all names have the same hash. In the second, the three long names have the
 // same hash. In the third, the two names of 8 characters have the same hash, and the two long names
 // have the same hash. In the names of 8 characters, seven rotations follow the first character.
-// They rotate it by 63 bits to the left, which equals one bit to the right. The hash is then
-// combined with the eighth character by XOR: "b" (0x62) becomes 0x31, and 0x31 ^ "q" (0x71) is
-// 0x40. "d" (0x64) becomes 0x32, and 0x32 ^ "r" (0x72) is also 0x40.
+// These rotations move the first character by 63 bits to the left, which equals one bit to the
+// right. "b" (0x62) becomes 0x31, and "d" (0x64) becomes 0x32. The result is then combined with the
+// eighth character by XOR: 0x31 ^ "q" (0x71) and 0x32 ^ "r" (0x72) are both 0x40. The six
+// characters between are the same in the two names.
 TEST(EntryDigests, NamesWithEqualHashesAreDistinguished) {
   const std::vector<std::string> families[] = {
       {With64Between("abc"), With64Between("acb"), With64Between("bac"), With64Between("bca"),
@@ -193,8 +195,8 @@ TEST(EntryDigests, LoadingAnotherManifestForgetsTheFirst) {
   }
 }
 
-// Loads every pair of these manifests, one after the other. Some have sorted names, some have
-// unsorted names, and the last does not parse.
+// For every pair of these manifests, loads the first and then the second. Some manifests have
+// sorted names, some have unsorted names, and the last manifest does not parse.
 TEST(EntryDigests, EarlierManifestDoesNotAffectTheNext) {
   const std::string manifests[] = {
       "",
@@ -221,8 +223,9 @@ TEST(EntryDigests, EarlierManifestDoesNotAffectTheNext) {
   }
 }
 
-// The third section is still in memory: after the end of the new text, and in the memory that the
-// table of ManifestSections used before. It must not be listed.
+// The third section of `whole` is still in memory after the second Load: after the end of the new
+// text, and in the memory that the table of ManifestSections used before. This section must not be
+// listed.
 TEST(EntryDigests, SectionAfterTheEndOfTheTextIsNotListed) {
   const std::string two = Section("a", "1") + Section("b", "2");
   const std::string whole = two + Section("c", "3");

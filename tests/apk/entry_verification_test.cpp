@@ -1,4 +1,4 @@
-// Tests how single entries and files are compared with the digests that the manifest records.
+// Tests how single entries and files are compared with the digests that the manifest lists.
 #include <gtest/gtest.h>
 #include <sys/stat.h>
 #include <unistd.h>
@@ -313,7 +313,7 @@ TEST(VerifyFileHash, FileIsReadEvenIfItsListedDigestIsBad) {
   }
 }
 
-// The missing bytes count as zeros, even if the buffer contained bytes of another file before.
+// The missing bytes count as zeros, even if an earlier read left other bytes in the buffer.
 TEST(VerifyFileHash, FileThatShrinksDuringTheReadEndsInZeros) {
   PackageOptions options;
   options.entries = {{"first", ToBytes("the first file")},

@@ -85,9 +85,9 @@ TEST(Extraction, StoredEntryMustBeAsLongAsItsData) {
   EXPECT_TRUE(IsPlausibleLength(entry));
 }
 
-// An entry of zeros. Its length is above kZipTrustedLength, even if the entry declares one byte
-// less. It is made once, because the compression takes time.
+// A test declares the length kLongLength - 1, which is also above kZipTrustedLength.
 constexpr uint32_t kLongLength = kZipTrustedLength + 2;
+// An entry of kLongLength zeros. It is made once, because the compression takes time.
 const ZipItem& LongItem() {
   static const ZipItem item = [] {
     ZipItem made{"a", Bytes(kLongLength, 0), true};

@@ -1,7 +1,7 @@
-// Counts the comparisons that the readers of a JAR manifest make, because their results do not show
-// this number. Also makes memcpy copy backwards, so that a reader that calls memcpy for overlapping
-// pieces fails. The linker redirects all calls of memcmp, bcmp and memcpy in this program to the
-// functions below.
+// Counts the comparisons in the classes that read a JAR manifest, because the results of these
+// classes do not show the number of comparisons. One test makes memcpy copy backwards. That test
+// fails if a class calls memcpy for overlapping pieces. The linker redirects all calls of memcmp,
+// bcmp and memcpy in this program to the functions below.
 #include <gtest/gtest.h>
 
 #include <algorithm>
@@ -18,8 +18,8 @@
 namespace {
 
 size_t comparisons = 0;
-// True: copies begin at the last byte. The C standard permits this for memcpy, because its source
-// and its target must not overlap.
+// True: memcpy copies the last byte first. The C standard permits this order, because the source
+// and the target of memcpy must not overlap.
 bool copies_backwards = false;
 
 }  // namespace
@@ -33,7 +33,7 @@ int __wrap_memcmp(const void* a, const void* b, size_t size) {
   return __real_memcmp(a, b, size);
 }
 
-// Compilers turn a memcmp into this call if only equality matters.
+// Compilers can replace memcmp by bcmp if only equality matters.
 int __wrap_bcmp(const void* a, const void* b, size_t size) { return __wrap_memcmp(a, b, size); }
 
 void* __wrap_memcpy(void* to, const void* from, size_t size) {
@@ -51,7 +51,7 @@ class JarManifestCalls : public testing::Test {
   ~JarManifestCalls() override { copies_backwards = false; }
 };
 
-// The number of comparisons of attribute names for a text of one section.
+// The number of comparisons when a section with attributes of these names is loaded.
 size_t ComparisonsOf(const std::vector<std::string>& names) {
   std::string text;
   for (const std::string& name : names) text += name + ": 1\r\n";
@@ -69,10 +69,10 @@ std::vector<std::string> ShortNames(size_t count) {
   return names;
 }
 
-// A sort compares each name with about log2(4096) = 12 others. Before the end of the section, its
-// names are sorted again only after their number has more than doubled. At the end of the section,
-// they are sorted once more. Here all sorts together make about twice the comparisons of that last
-// sort. This test allows twice that number.
+// A sort compares each name with about log2(4096) = 12 others. In this test, the names are sorted
+// again before the end of the section only after their number has more than doubled. At the end of
+// the section, the names are sorted once more. All sorts together need about twice the comparisons
+// of the last sort: about 24 for each name. This test allows 48 for each name.
 TEST_F(JarManifestCalls, ShuffledNamesNeed12To48ComparisonsEach) {
   std::vector<std::string> names = ShortNames(4096);
   std::shuffle(names.begin(), names.end(), std::mt19937(1));
@@ -97,10 +97,10 @@ TEST_F(JarManifestCalls, RepeatedNamesNeedFewerThan48ComparisonsEach) {
   EXPECT_LT(ComparisonsOf(names), 4 * 12u * 4096);
 }
 
-// The text before the reset does not matter.
+// Attributes that were added before reset() do not matter.
 TEST_F(JarManifestCalls, TableAfterResetComparesAsOftenAsAFreshTable) {
   std::string text(100000, 'a');
-  text[90001] = 'b';  // this name is the last in the text and in byte order
+  text[90001] = 'b';  // the name at 90001: it is last in the text and in byte order
   const auto* const bytes = reinterpret_cast<const uint8_t*>(text.data());
   const auto repeat = [&](ManifestSections& sections) {
     comparisons = 0;
@@ -145,7 +145,7 @@ TEST_F(JarManifestCalls, NamesInOrderAreNotHashed) {
   EXPECT_GT(in_order, 12u);
 }
 
-// ---- Continuation lines, which move up to the line before them.
+// ---- Continuation lines. The parser moves each of them to the end of the line before it.
 
 TEST_F(JarManifestCalls, LinesThatOverlapTheirNewPlaceAreMovedWhole) {
   std::string value;

@@ -17,8 +17,8 @@ namespace {
 using Section = std::map<std::string, std::string>;
 using Sections = std::vector<Section>;
 
-// Copies the sections into maps. First checks that the attributes are in order, because a map would
-// hide a wrong order.
+// Copies the sections into maps. Checks that the attributes of each section are sorted by name,
+// because a map would hide a wrong order.
 Sections SectionsOf(const ManifestMf& manifest) {
   Sections sections;
   for (const ManifestMf::Section& section : manifest.getSections()) {
@@ -83,8 +83,8 @@ TEST(ManifestMf, LoadReplacesTheEarlierResult) {
   EXPECT_EQ(Sections({{{"A", "1"}}}), SectionsOf(manifest));
 }
 
-// Loads every pair of these texts, one after the other. Some do not parse. Leftovers of the first
-// text would show in the result of the second.
+// For every pair of the texts below, loads both into one object, one after the other. Some texts do
+// not parse. Leftovers of the first text would show in the result of the second.
 TEST(ManifestMf, EarlierTextDoesNotAffectTheNext) {
   std::string many = "Longer-Name: longer value\r\n\r\n";
   for (int i = 0; i < 50; ++i) many += "B" + std::to_string(i) + ": 1\r\nC: 2\r\n\r\n";
@@ -177,7 +177,7 @@ TEST(ManifestMf, SeveralLinesContinueAValue) {
             Parse("A: one\r\n two\r\n  three\r\n \r\nB: 2\r\n\r\n"));
 }
 
-// The value is one piece of the manifest's own text, right after its name and ": ".
+// The joined value is one piece of the manifest's own text. It begins right after "A: ".
 TEST(ManifestMf, ContinuationLinesMoveUpToTheirValue) {
   ManifestMf manifest;
   EXPECT_TRUE(manifest.load(std::string("A: 1\r\n 23\n 45\r\n\r\n")));
@@ -321,7 +321,7 @@ TEST(ManifestMf, ContinuationAfterAColonAndALoneLineFeedIsAName) {
   EXPECT_EQ(Sections({{{"value\nName", "x"}}}), Parse("A:\n value\nName: x\n\n"));
 }
 
-// The first byte of the next line and a CR or LF after it together are one line break.
+// "N", the first byte of the next line, and the LF after "N" are together one line break.
 TEST(ManifestMf, OneByteLineAfterAColonAndALoneLineFeedIsLostWithItsLineBreak) {
   EXPECT_EQ(Sections({{{"Name", "x"}}}), Parse("A:\nN\nName: x\n\n"));
 }
@@ -380,7 +380,8 @@ TEST(ManifestMf, NulInAValueIsALineBreak) {
   EXPECT_EQ(Sections({{{"A", "12"}}}), Parse(Text("A: 1\0 2\r\n\r\n")));
 }
 
-// NUL CR and NUL LF are one line break, like CR LF; the second of two NULs starts a name.
+// A NUL and a CR or LF after it are one line break, like CR LF. The second of two NULs starts a
+// name.
 TEST(ManifestMf, NulAndTheCrOrLfAfterItAreOneLineBreak) {
   EXPECT_EQ(Sections({{{"A", "1"}, {"B", "2"}}}), Parse(Text("A: 1\0\nB: 2\r\n\r\n")));
   EXPECT_EQ(Sections({{{"A", "1"}}, {{"B", "2"}}}), Parse(Text("A: 1\0\r\nB: 2\r\n\r\n")));
@@ -407,10 +408,10 @@ TEST(ManifestMf, EveryPrefixGivesTheFirstSectionsOfTheWholeText) {
   }
 }
 
-// The test below compares the parser with the JDK's parser, on manifests as tools write them.
+// The last test compares the parser with the JDK's parser, on random well-formed manifests.
 
-// A line as the JAR File Specification defines it: at most 72 bytes. A continuation line starts
-// with a space.
+// One attribute, in lines as the JAR File Specification defines them. A line has at most 72 bytes
+// before its line break. A continuation line starts with a space.
 std::string Line(const std::string& name, const std::string& value) {
   std::string line = name + ": " + value;
   std::string text;

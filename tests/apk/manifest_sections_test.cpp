@@ -1,4 +1,4 @@
-// The table of attributes: look-up, iteration, and repeated names.
+// Tests the table of a manifest's sections: iteration, look-up, and repeated names.
 #include "apk/manifest_sections.h"
 
 #include <gtest/gtest.h>
@@ -106,8 +106,8 @@ TEST(ManifestSection, FindsTheLastNameWithTheSuffix) {
   EXPECT_EQ(std::make_pair(std::string_view(), std::string_view()), section.findLastEndingIn("-Q"));
 }
 
-// A sort that is not stable may keep a few equal names in order by chance, but not so many. The
-// sections have different sizes, so that the table grows while a section is open.
+// The test has many equal names, because a wrong sort can leave a few equal names in order by
+// chance. Some sections are large, so that the table's memory grows while a section is open.
 TEST(ManifestSection, LastOfEqualNamesCounts) {
   std::mt19937 random(1);
   Table table(8 << 20);
@@ -130,9 +130,9 @@ TEST(ManifestSection, LastOfEqualNamesCounts) {
 
 // Two long names that differ only in their last byte come before very many short names. The
 // addition of the second long name compares the long names once. While the short names are added,
-// the long names are unreadable, so a comparison would crash. The long names may be compared again
-// only after more text: at least as many bytes as both names have together, counted from the start
-// of the second name.
+// the long names are unreadable, so a comparison of a long name would crash. The long names may be
+// compared again only after more text: at least as many bytes as both long names have together,
+// counted from the start of the second long name.
 TEST(ManifestSection, LongNamesAreNotComparedAgainForEachShortName) {
   constexpr uint32_t kLength = 1 << 20;
   constexpr size_t kAll = 3 * kLength;

@@ -34,8 +34,8 @@ long PeakMemory() {
   return -1;
 }
 
-// The growth of the peak memory during `task`, in kilobytes; -1 if the process dies or `task`
-// returns false.
+// Runs `task` in a child process. Returns the growth of the child's peak memory, in kilobytes; -1
+// if the child dies or `task` returns false.
 long PeakGrowth(const std::function<bool()>& task) {
   int ends[2];
   EXPECT_EQ(pipe(ends), 0);
@@ -105,8 +105,8 @@ TEST(ApkMemory, RepeatedNamesTakeLittleBesidesTheText) {
 }
 
 // A million sections of one attribute each. Each section takes 20 bytes in ManifestSections, and 20
-// more bytes while ManifestSections grows. Repeated names after these sections take no memory
-// there, but they make the text itself 20 MB longer.
+// more bytes while ManifestSections grows. Repeated names after these sections take almost no
+// memory in ManifestSections, but they make the text 20 MB longer.
 TEST(ApkMemory, RepeatedNamesAfterManySectionsTakeLittleBesidesTheText) {
   const std::string sections = Repeat("A: 1\n\n", 1000000);
   const long growth = GrowthWithSignatureFile(sections);
@@ -115,16 +115,16 @@ TEST(ApkMemory, RepeatedNamesAfterManySectionsTakeLittleBesidesTheText) {
 }
 
 // A document whose string pool has overlapping UTF-8 strings. Each string starts with its two
-// lengths, which are also part of the strings before it. All strings end with the pool's last byte.
-// Each string is the name of an element, and the platform's library makes a separate UTF-16 copy of
-// each name.
+// lengths, which are also part of the strings before it. All strings end at the same NUL,
+// which is the pool's last byte. Each string is the name of an element, and the platform's library
+// makes a separate UTF-16 copy of each name.
 Bytes DocumentOfOverlappingStrings() {
   constexpr uint32_t kText = 16000, kHeader = 28;
   Bytes text(kText, 'a'), offsets, elements;
   uint32_t count = 0;
   for (uint32_t at = 0; at + 4 < kText; at += 4) {
     const uint32_t length = kText - 1 - (at + 4);
-    if ((length & 0xff) == 0 || (length & 0xff) > 0x7f) continue;  // NUL, or not ASCII
+    if ((length & 0xff) == 0 || (length & 0xff) > 0x7f) continue;  // low byte: NUL, or not ASCII
     for (uint32_t i = 0; i < 4; i += 2) {
       text[at + i] = static_cast<uint8_t>(0x80 | length >> 8);
       text[at + i + 1] = static_cast<uint8_t>(length & 0xff);

@@ -21,8 +21,8 @@ TEST(VerifyCertificate, FailedAllocationForTheKeyIsReportedWithCode9) {
 }
 
 // The second allocation is for the key's exponent. The next allocations belong to the verification
-// of the certificate, and the last ones to the verification of the data. A failed allocation makes
-// its verification fail.
+// of the certificate. The last allocations belong to the verification of the signature file, which
+// the log calls "data". If an allocation fails, the verification that needs the memory fails.
 TEST(VerifyCertificate, FailedAllocationInTheVerificationIsReported) {
   const Bytes archive = MakePackage().Build();
   int certificates = 0, signatures = 0;

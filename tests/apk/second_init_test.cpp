@@ -1,5 +1,5 @@
-// Tests Init on a used object, with every pair of packages of different shapes. Leftovers of the
-// first package would show in the facts of the second (docs/decisions/second-init.md).
+// Tests a second Apk::Init of the same object (docs/decisions/second-init.md). The first file is
+// always a good package. The second file is a good package or a file that does not verify.
 #include <gtest/gtest.h>
 
 #include <fcntl.h>
@@ -67,7 +67,7 @@ PackageOptions WithEntries(const std::vector<std::string>& names) {
   return options;
 }
 
-// Good packages. After Init, all facts must come from the package's own file.
+// Packages that verify. They differ in their manifests, keys, names and permissions.
 std::vector<PackageOptions> GoodPackages() {
   std::vector<PackageOptions> all;
   // Names in order, and a dex file.
@@ -82,7 +82,7 @@ std::vector<PackageOptions> GoodPackages() {
   all.push_back(WithEntries({"c"}));
   all.back().block.key = "rsa-1024";
   all.back().package_name = "";
-  // A manifest that lists nothing, one with an empty section, and one without text.
+  // Three manifests: without entries, with an empty section, and without text.
   for (const char* text : {"Manifest-Version: 1.0\r\n\r\n", "Key:\r\n\r\n", ""}) {
     all.push_back(WithManifest(text));
     all.back().entries.clear();

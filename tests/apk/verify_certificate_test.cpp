@@ -91,9 +91,9 @@ TEST(VerifyCertificate, SignatureOverOtherBytesFails) {
                      Error(kNotVerified)}));
 }
 
-// The signature is found by its position (crypto/pkcs7.cpp), and the attributes move every later
-// element by one place. The bytes that are read as the signature therefore start with the contents
-// of the digestEncryptionAlgorithm. They have no valid padding, even if the real signature is good.
+// The tool finds the signature by its position among the elements of the SignerInfo
+// (crypto/pkcs7.cpp). If there are attributes, the digestEncryptionAlgorithm is at this position.
+// The tool then reads the wrong bytes as the signature, and refuses the padding (result 7).
 TEST(VerifyCertificate, BlockWithAuthenticatedAttributesFails) {
   SignatureBlock block;
   block.authenticated_attributes = true;
@@ -101,8 +101,8 @@ TEST(VerifyCertificate, BlockWithAuthenticatedAttributesFails) {
             Records({Error("RSA could not verify data: 7\n"), Error(kNotVerified)}));
 }
 
-// Returns a block with one certificate. Its public key has this modulus and this exponent, and the
-// certificate's own signature has `signature_length` bytes.
+// Returns a block with one certificate. The certificate has a public key with this modulus and this
+// exponent, and a signature of `signature_length` bytes.
 SignatureBlock WithPublicKey(const Bytes& modulus, const Bytes& exponent, size_t signature_length) {
   Certificate certificate;
   certificate.public_key_info =
@@ -171,8 +171,8 @@ TEST(VerifyCertificate, SignatureThatEndsBeyondTheBlockFails) {
             Records({Error("RSA could not verify data: 5\n"), Error(kNotVerified)}));
 }
 
-// Returns the options for a package. The signature in its block is the result of `encode` for a
-// good signature.
+// Returns the options for a package. `encode` makes the whole encryptedDigest element of the block
+// from the bytes of a good signature.
 template <typename Encode>
 PackageOptions WithEncodedSignature(Encode encode) {
   PackageOptions options;

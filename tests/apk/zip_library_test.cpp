@@ -1,5 +1,5 @@
-// Tests the adapter to the zip library, for both generations of the library: names are `ZipString`
-// in the older one and std::string_view in the later one.
+// Tests apk/zip_library.h for both generations of the zip library. The older generation accepts
+// names as `ZipString`, and the later generation as std::string_view.
 #include "apk/zip_library.h"
 
 #include <gtest/gtest.h>

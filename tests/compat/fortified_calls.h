@@ -1,12 +1,13 @@
 // In a build with _FORTIFY_SOURCE, Bionic's headers give some calls another name. For example, read
 // becomes __read_chk. Every source tree of the platform builds in this way. The tests replace some
-// calls by functions of their own (--wrap), and must also do so under these names. The preset
-// `fortify` checks this on a workstation. The workstation's C library has functions such as
-// __read_chk, but its headers rarely call them. This header therefore calls them.
+// calls by functions of their own (the linker option --wrap). The tests must also replace these
+// calls under their other names. The preset `fortify` checks this replacement on a workstation.
+// There, the C library has functions such as __read_chk, but the C library's headers rarely call
+// them. The functions below therefore call them.
 //
 // The preset includes this header at the start of every source (-include). The attribute
 // pass_object_size makes each function below an overload of the C library's function, even if both
-// have the same parameter types. The compiler prefers this overload because of enable_if.
+// have the same parameter types. The compiler prefers the functions below because of enable_if.
 #pragma once
 
 #include <fcntl.h>

@@ -132,9 +132,10 @@ TEST(Asn1GetNext, LongFormTagMayHaveOneOctet) {
 }
 
 TEST(Asn1GetNext, LongFormTagKeepsItsLow32Bits) {
-  // Ten octets have 70 bits. The low 32 bits are 0x11223344, and all bits above are ones. In groups
-  // of seven bits, 0x11223344 is 0001 0001001 0001000 1100110 1000100. The three bits above fill
-  // the first of these groups with ones: 1110001. Its octet is 0xf1.
+  // The tag number has ten octets with seven bits each. The low 32 bits are 0x11223344, and all
+  // higher bits are ones. In groups of seven bits, 0x11223344 is 0001 0001001 0001000 1100110
+  // 1000100. The first group has only four bits. The three bits above complete it with ones:
+  // 1110001. With the continuation bit, this is the octet 0xf1.
   asn1_hdr hdr;
   EXPECT_EQ(Read(FromHex("1f ff ff ff ff ff f1 89 88 e6 44 00"), &hdr), 0);
   EXPECT_EQ(hdr.tag, 0x11223344u);
@@ -299,7 +300,8 @@ TEST(Asn1ParseOid, FirstValue2To32GivesArcs2AndFfffffb0) {
 }
 
 TEST(Asn1ParseOid, ArcKeepsItsLow32Bits) {
-  // The last arc has ten octets of seven bits each. All bits are ones except the last: 2^70 - 2.
+  // The last arc has ten octets with seven bits each. Only the lowest of the 70 bits is zero, so
+  // the arc is 2^70 - 2.
   const Bytes contents = FromHex("2a ff ff ff ff ff ff ff ff ff 7e");
   asn1_oid oid;
   EXPECT_EQ(asn1_parse_oid(contents.data(), contents.size(), &oid), 0);
@@ -437,7 +439,8 @@ TEST(Asn1BitStringToLong, LastBitOfTheFirstByteIsBitSeven) {
 
 TEST(Asn1BitStringToLong, FirstByteIsTheLowestAndBitsAreReversed) {
   // The bits of each byte are reversed: 0x12 = 00010010 becomes 01001000 = 0x48. In the same way,
-  // 0x34 becomes 0x2c, 0x56 becomes 0x6a, and 0x78 becomes 0x1e. The first byte is the lowest.
+  // 0x34 becomes 0x2c, 0x56 becomes 0x6a, and 0x78 becomes 0x1e. The first byte after the count of
+  // unused bits becomes the lowest byte.
   EXPECT_EQ(asn1_bit_string_to_long(FromHex("00 12 34 56 78").data(), 5), 0x1e6a2c48u);
 }
 

@@ -10,8 +10,8 @@ namespace {
 
 constexpr int kRounds = 150000;
 
-// About half of the dividends are random. The others are equal to or next to a multiple of the
-// divisor, where the estimate of a quotient digit is most often wrong.
+// About half of the dividends are random. Each other dividend is a multiple of the divisor, or 1 to
+// 3 less than a multiple. Near multiples, the estimate of a quotient digit is most often wrong.
 TEST(MpiModMpi, IsTheNonNegativeRemainder) {
   Operands operands;
   for (int round = 0; round < kRounds; ++round) {
@@ -64,8 +64,8 @@ TEST(MpiModMpi, IgnoresTheDivisorsSign) {
   EXPECT_EQ(1, Value(R));  // 2^32 = 4 mod 7, 5 * 4 = 6 mod 7
 }
 
-// mpi_mod_mpi first shifts both numbers until the highest bit of the divisor is set. If this bit
-// stayed clear, the estimate of a quotient digit would wrap for these numbers.
+// mpi_mod_mpi first shifts both numbers left, until the highest bit of the divisor's top limb is
+// set. If this bit stayed clear, the estimate of a quotient digit would wrap for these numbers.
 TEST(MpiModMpi, IsRightForADivisorWithATopLimbOf31Bits) {
   Number A({0x8712b8bc, 0xffffffff, 0x4000fffe});
   Number B({0x00000001, 0x4000ffff});
@@ -102,8 +102,8 @@ TEST(MpiModMpi, IsRightFor2To8192AndAModulusOf128Limbs) {
 // (crypto/mpi.cpp) first divides the top limb of A by the upper half of d: 48000000 / 8000 is 9000,
 // with remainder 0. It then adds d to the remainder until the sum wraps or is at least 9000 * ffff.
 // The first sum is d itself. This sum did not wrap and is less than 9000 * ffff, so d must be added
-// again. Code that stops after the first addition gets a digit that is far too large, and then
-// reduces the digit by one at a time, which is slow.
+// again. If half_digit stopped after the first addition, its result would be far too large.
+// quotient_digit would then reduce the digit in steps of 1, which is slow.
 TEST(MpiModMpi, IsFastIfTheFirstSumEqualsTheDivisorsTopLimb) {
   const Number A({0x12345678, 0x0000abcd, 0x48000000});
   const Number B({0xfedcba98, 0x8000ffff});

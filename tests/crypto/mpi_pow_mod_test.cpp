@@ -175,8 +175,8 @@ TEST(MpiPowMod, UsesAWindowOfOneForExponents3And65537) {
   EXPECT_EQ(AllocationsForExponent(1), AllocationsForExponent(PowerOfTwo(23) - 1));
 }
 
-// The table for a window of one bit has only the first power. The table for w > 1 bits has 2^(w-1)
-// more. No window has 2 bits.
+// The table for a window of one bit has only the base itself. The table for w > 1 bits also has
+// 2^(w-1) powers of the base. No window has 2 bits.
 TEST(MpiPowMod, WidensTheWindowWithTheExponent) {
   const int fixed = AllocationsForExponent(1);
   int before = fixed;

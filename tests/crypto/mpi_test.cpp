@@ -1,6 +1,6 @@
-// The big integers, compared with GMP. Each operation that computes a value gets kRounds random
-// operands, except mpi_mod_mpi, mpi_montmul and mpi_pow_mod, which other files test. Many operands
-// are made of limbs that cause carries.
+// The big integers, compared with GMP. Other files test the results of mpi_mod_mpi, mpi_montmul and
+// mpi_pow_mod. Here, the other operations that compute a value are called kRounds times with random
+// operands. Many operands are made of limbs that cause carries.
 #include "crypto/mpi.h"
 
 #include <gtest/gtest.h>

@@ -37,7 +37,7 @@ inline int ResultOf(const Certificate& certificate) {
 
 inline int ResultOf(const Bytes& der) { return ParsedCertificate(der).result; }
 
-// A field of the record, as bytes and as text.
+// A field of the record, as bytes or as text.
 inline Bytes Field(const uint8_t* value, uint64_t length) { return Bytes(value, value + length); }
 inline std::string TextField(const uint8_t* value, uint64_t length) {
   return std::string(value, value + length);

@@ -19,7 +19,7 @@ SignatureBlock WithSigners(const Bytes& signer_infos) {
   return block;
 }
 
-// A SET of one SignerInfo. It has a version and an issuer, and then these elements.
+// A SET of one SignerInfo. The SignerInfo has a version, an issuer, and then `elements`.
 Bytes SignerOf(const std::vector<Bytes>& elements) {
   return der::Set({der::Sequence({der::Integer(1), der::Sequence({}), Concat(elements)})});
 }
@@ -29,13 +29,16 @@ const Bytes& Sha256Algorithm() {
   return algorithm;
 }
 
-// A block of indefinite lengths. Its certificate is followed by these bytes, which end the block.
+// A block that ends with the [0] of the certificates, followed by `signers`. The enclosing elements
+// have the indefinite form (see BlockEndingIn).
 Bytes BlockEndingInSigners(const Bytes& signers) {
   return BlockEndingIn(
       Concat({der::Context(0, *WithRsaKey(Bytes(64, 0x77), {3}).certificates), signers}));
 }
 
-// True if every part of the record that must be inside the block is inside.
+// True if tbs_data and cert_signature are inside the block, and if modulus and signed_digest start
+// inside the block or at its end. A null modulus or signed_digest is accepted. A null tbs_data or
+// cert_signature is accepted only if its length is 0.
 bool Inside(const GuardedBytes& block, const pkcs7& record) {
   const auto inside = [&](const uint8_t* value, size_t length) {
     if (value == nullptr) return length == 0;
@@ -47,7 +50,8 @@ bool Inside(const GuardedBytes& block, const pkcs7& record) {
          inside(record.signed_digest, 0);
 }
 
-// True if the record of this damaged block stays inside it.
+// Calls processCert for a damaged block. True if the result is 0 or 1 and Inside returns true for
+// the record.
 bool StaysInside(const GuardedBytes& block) {
   pkcs7 record = {};
   const int result = processCert(block.data(), static_cast<uint32_t>(block.size()), &record);
@@ -70,8 +74,8 @@ TEST(ProcessCertSigner, UnreadableHeadersAreReported) {
 }
 
 TEST(ProcessCertSigner, SignersBeyondTheEndAreReportedAsUnreadable) {
-  // The block ends with the [0] of the certificates. The length in the header of the [0] is five
-  // bytes greater than its contents.
+  // The block ends with the [0] of the certificates. The header of the [0] declares five bytes more
+  // than the [0] contains.
   const Bytes certificate = *WithRsaKey(Bytes(64, 0x77), {3}).certificates;
   Bytes certificates = der::Context(0, Concat({certificate, Bytes(5)}));
   certificates.resize(certificates.size() - 5);
@@ -99,8 +103,8 @@ TEST(ProcessCertSigner, SignerInfosAndTheFirstSignerInfoMayEndWithTheBlock) {
 TEST(ProcessCertSigner, VersionAndIssuerMayFollowAnEmptySignerInfo) {
   // The SignerInfo is empty. The version and the issuer are read from the bytes after it, and the
   // digestAlgorithm is missing. In the first and the third case, the issuer ends with the block.
-  // The second case is the first one with a version that is one byte longer. The fourth case is the
-  // third one with an issuer that is one byte longer.
+  // The second case is the first case, but the header of the version declares one byte more. The
+  // fourth case is the third case, but the header of the issuer declares one byte more.
   const std::pair<const char*, const char*> cases[] = {
       {"31 00 30 00 02 03 01 02 03 30 00", kNoAlgorithm},
       {"31 00 30 00 02 04 01 02 03 30 00", kUnreadable},
@@ -135,9 +139,9 @@ TEST(ProcessCertSigner, MalformedDigestAlgorithmIsReported) {
 }
 
 TEST(ProcessCertSigner, DigestAlgorithmMustEndWithinTheSignerInfo) {
-  // Four blocks that differ only in the length of the SignerInfo. The SignerInfo ends one byte
-  // before the start of the digestAlgorithm, at this start, one byte before the end of the
-  // digestAlgorithm, and at this end.
+  // Four blocks that differ only in the length in the SignerInfo's header. By this length, the
+  // SignerInfo ends one byte before the digestAlgorithm, at the start of the digestAlgorithm, one
+  // byte before the end of the digestAlgorithm, or at the end of the digestAlgorithm.
   const Bytes start = Concat({der::Integer(1), der::Sequence({})});
   const Bytes rest = Concat({AlgorithmIdentifier("1.2.3"), der::OctetString(Bytes(8, 1))});
   const size_t algorithm_end = start.size() + Sha256Algorithm().size();
@@ -219,8 +223,8 @@ TEST(ProcessCertSigner, AuthenticatedAttributesGiveTheWrongEncryptedDigest) {
   const ProcessedBlock processed(block);
   EXPECT_EQ(processed.result, 0);
   EXPECT_EQ(processed.output, "");
-  // The digestEncryptionAlgorithm is read as the encryptedDigest. Its contents are rsaEncryption
-  // and NULL.
+  // The digestEncryptionAlgorithm is read as the encryptedDigest. The contents of the
+  // digestEncryptionAlgorithm are rsaEncryption and NULL.
   EXPECT_EQ(Field(processed.record.signed_digest, processed.record.signed_digest_length),
             Concat({der::Oid("1.2.840.113549.1.1.1"), der::Null()}));
 }
@@ -236,7 +240,7 @@ TEST(ProcessCertDamagedBlock, EveryTruncationIsRefused) {
 }
 
 TEST(ProcessCertDamagedBlock, EveryTruncationOfABlockOfIndefiniteLengthsStaysInside) {
-  // By its length, the SignerInfo ends with the digestAlgorithm. The tool accepts an
+  // By its length, the SignerInfo ends with the digestAlgorithm. processCert can accept an
   // encryptedDigest that ends beyond the block. A block that is cut inside the encryptedDigest can
   // therefore be accepted, so this test does not check the result.
   const Bytes whole = BlockEndingInSigners(Concat({

@@ -101,7 +101,7 @@ TEST(ProcessCertHeader, LaterUnreadableHeaderIsReportedWithTagAndOffsetOfNull) {
 }
 
 TEST(ProcessCertHeader, TagIsPrintedAsASignedNumber) {
-  // 2^31 - 1, 2^31 and 2^32 - 1, in octets of seven bits.
+  // The tags are 2^31 - 1, 2^31 and 2^32 - 1. Each octet after the first has seven bits of the tag.
   const std::pair<const char*, int32_t> cases[] = {{"bf 87 ff ff ff 7f", 2147483647},
                                                    {"bf 88 80 80 80 00", INT32_MIN},
                                                    {"bf 8f ff ff ff 7f", -1}};
@@ -294,8 +294,9 @@ TEST(ProcessCertKey, ExponentElementMayNotBeLongerThanTheModulus) {
   EXPECT_EQ(processed.record.modulus_length, 4u);
 }
 
-// With its leading zero, the modulus has five bytes. The record leaves out the zero, but the limit
-// for the exponent's element counts it.
+// The exponent's element has five bytes. With its leading zero, the first modulus has five bytes,
+// and the second has four. The record leaves out the zero, but the limit for the exponent's element
+// counts the zero.
 TEST(ProcessCertKey, ExponentMayBeAsLongAsTheModulusWithItsLeadingZero) {
   const ProcessedBlock processed(WithRsaKey(Concat({{0x00}, Bytes(4, 0x77)}), {1, 0, 1}));
   EXPECT_EQ(processed.result, 0);

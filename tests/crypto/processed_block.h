@@ -70,9 +70,9 @@ inline SignatureBlock WithRsaKey(const Bytes& modulus, const Bytes& exponent) {
   return WithPublicKey(der::Sequence({der::Integer(modulus), der::Integer(exponent)}));
 }
 
-// A block that ends with these bytes, which start with the [0] of the certificates. The enclosing
-// elements have the indefinite form, which processCert reads as length 0. They therefore never end
-// beyond the block.
+// A block that ends with `certificates`. These bytes must start with the [0] of the certificates.
+// The enclosing elements have the indefinite form. processCert reads this form as length 0, so the
+// enclosing elements never end beyond the block.
 inline Bytes BlockEndingIn(const Bytes& certificates) {
   return Concat({FromHex("30 80"), der::Oid("1.2.840.113549.1.7.2"),
                  FromHex("a0 80 30 80 02 01 01 31 00 30 00"), certificates});

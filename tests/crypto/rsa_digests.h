@@ -1,5 +1,4 @@
-// The digests that the signatures in the RSA tests cover, and Verify, which checks a signature with
-// all three.
+// Three digests for the RSA tests. Verify checks a signature with all three digests.
 #pragma once
 
 #include "crypto/rsa.h"

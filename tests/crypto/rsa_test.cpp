@@ -1,5 +1,5 @@
-// Tests rsa_pkcs1_verify with signatures from libcrypto, and with blocks made by hand. The tests
-// sign these blocks as they are, with only the private-key operation.
+// Tests rsa_pkcs1_verify with signatures from libcrypto, and with encoded messages ("blocks") made
+// by hand. The tests apply only the private-key operation to a block. They add no padding.
 #include "crypto/rsa.h"
 
 #include <gtest/gtest.h>
@@ -291,7 +291,8 @@ TEST(RsaPkcs1Verify, NegativeLengthIsBadInput) {
   EXPECT_EQ(5, Verify(context, Bytes(1)));
 }
 
-// A block of 16 bytes is too short for any digest.
+// The result is 7 (invalid padding), not 5 (bad input): the length is accepted, but 16 bytes are
+// too short for any supported DigestInfo.
 TEST(RsaPkcs1Verify, LengthOf16IsAccepted) {
   const SmallKey key(16);
   LogCapture log;

@@ -1,4 +1,5 @@
-// The certificates of Debian's ca-certificates, compared with the output of `openssl x509`.
+// The tool's parser reads each certificate of Debian's package ca-certificates. The results are
+// compared with the output of `openssl x509`.
 #include <gtest/gtest.h>
 #include <openssl/bio.h>
 #include <openssl/mem.h>
@@ -51,7 +52,7 @@ std::vector<std::string> OpensslLines(const std::string& file) {
   return lines;
 }
 
-// The DER in the PEM file; empty if it cannot be read.
+// The DER in the PEM file; empty if the file cannot be read.
 Bytes DerOf(const std::string& file) {
   bssl::UniquePtr<BIO> bio(BIO_new_file(file.c_str(), "r"));
   char* name = nullptr;

@@ -13,8 +13,8 @@ constexpr char kSubjectAltName[] = "2.5.29.17";
 constexpr char kBasicConstraints[] = "2.5.29.19";
 constexpr char kUnknown[] = "1.2.3.4";
 
-// Returns the element with a length that is greater by `more`. The old and the new length must fit
-// in one octet.
+// Returns the element with a length that is greater by `more`. The new length must be less than
+// 128, so that it is one octet.
 Bytes RunningOn(Bytes element, size_t more = 1) {
   EXPECT_LT(element[1] + more, 0x80u);
   element[1] = static_cast<uint8_t>(element[1] + more);
@@ -97,7 +97,7 @@ TEST(X509TooLongElement, ElementsOfANameAreMinus12) {
 }
 
 // In each case, the parser could read an element only by using bytes after the element's container.
-// These bytes exist, but they belong to the next outer container.
+// These bytes exist, but they belong to an outer container.
 TEST(X509TooLongElement, ElementsOfANameMayNotUseBytesAfterTheirContainer) {
   const Bytes type = der::Oid(kCommonName);
   const Bytes attribute = der::Sequence({type, Value()});
@@ -118,9 +118,10 @@ TEST(X509TooLongElement, ElementsOfANameMayNotUseBytesAfterTheirContainer) {
   for (const Bytes& name : cases) EXPECT_EQ(ResultOf(WithSubject(name)), -12);
 }
 
-// In the first case, the second time ends in "0", not in "Z". In the second case, its last two
-// characters are missing. The subject follows the times. It has 90 bytes of contents, so it starts
-// with 30 5a. As text, these bytes are "0Z", which would complete the time of the second case.
+// In the first case, notAfter ends in "0", not in "Z". In the second case, the last two characters
+// of notAfter are missing. The subject follows the times. The subject has 90 bytes of contents, so
+// its first bytes are 30 5a. As text, these bytes are "0Z", which would complete notAfter in the
+// second case.
 TEST(X509TooLongElement, TimeIsMinus13) {
   Certificate certificate = WithSubject(Name({{kCommonName, std::string(79, 'x')}}));
   ASSERT_EQ(certificate.subject[0], '0');
@@ -251,7 +252,8 @@ TEST(X509TrailingBytes, LoneByteAfterTheKeyIsMinus5) {
   Certificate certificate = Unsigned();
   certificate.tbs_tail = {0xa4};
   EXPECT_EQ(ResultOf(certificate), -5);
-  // In a v1 certificate, the parser reads nothing after the key.
+  // In a v1 certificate, the parser reads nothing between the key and the end of the
+  // tbsCertificate.
   certificate.version = {};
   EXPECT_EQ(ResultOf(certificate), 0);
 }

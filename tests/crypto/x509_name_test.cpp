@@ -173,9 +173,9 @@ TEST(X509Name, MalformedNameIsMinus12) {
       der::Sequence({{0x31, 0x05}}),                               // a SET that runs past the end
       der::Sequence({der::Context(17, {})}),                       // a [17] in place of the SET
       der::Sequence({der::Set({})}),                               // an empty SET
-      der::Sequence({der::Set({der::Set({})})}),                   // no SEQUENCE in it
+      der::Sequence({der::Set({der::Set({})})}),                   // no SEQUENCE in the SET
       der::Sequence({der::Set({der::Sequence({})})}),              // no type
-      der::Sequence({der::Set({der::Sequence({value, value})})}),  // no type either
+      der::Sequence({der::Set({der::Sequence({value, value})})}),  // a value in place of the type
       der::Sequence({Rdn(kCommonName, Bytes())}),                  // no value
       der::Sequence({Rdn(kCommonName, {0x0c, 0x01})}),             // a value that runs past the end
       der::Sequence({Rdn(kCommonName, der::ContextPrimitive(12, {'x'}))}),  // a [12] as the value
@@ -242,8 +242,8 @@ TEST(X509Time, BothTimesAreRead) {
 }
 
 TEST(X509Time, OtherLengthsAreMinus13) {
-  // Without seconds, with a fraction of a second, with an offset, empty, and with the length of the
-  // other form. The last UTCTime has one digit too many.
+  // Both lists: without seconds, with a fraction of a second, with an offset, empty, and with the
+  // length of the other list's type. The last UTCTime has one digit too many.
   for (const char* text : {"2001020304Z", "200102030405.5Z", "200102030405+0100", "",
                            "20200102030405Z", "2001020304050Z"}) {
     NotBefore(der::kUtcTime, text, -13);

@@ -24,8 +24,8 @@ using namespace simulator;
 
 namespace {
 
-// Sends standard error to a file during the object's life. An abort prints its message there,
-// hundreds of times in a test.
+// Sends standard error to a file during the object's life, because the aborts in one test print
+// hundreds of messages.
 class KeptStandardError {
  public:
   explicit KeptStandardError(const std::string& path) : saved_(dup(STDERR_FILENO)) {
@@ -121,13 +121,14 @@ bool IsExit0(const ToolEnd& ending) {
 }
 
 // The expected grants for one function, one text per run. The function's first call fails in the
-// first run, its second call in the second run, and so on. Most comments in the tables below name
-// these calls.
+// first run, its second call in the second run, and so on. In the tables below, most comments
+// name the calls of one function in order.
 using Runs = std::vector<std::string>;
 using Table = std::map<std::string, Runs>;
 
-// Makes each call of the functions in `table` fail, one per run. One more run for each function
-// chooses a call that the tool never makes. `all` are the grants of a run without a fault.
+// Makes each call of the functions in `table` fail, one per run. In one more run for each function,
+// the fault names a call that the tool never makes, so no call fails. `all` are the grants of a run
+// without a failed call.
 void ExpectRuns(Installed& file, const std::string& all, const Table& table) {
   for (const auto& [function, runs] : table) {
     for (size_t call = 1; call <= runs.size() + 1; ++call) {
@@ -167,8 +168,8 @@ TEST(FailedCalls, RemoveOnlyDependentGrantsOfAGoodPackage) {
              {{"open", {"", "PK", "PK"}},     // the package; the library, to read it and to sign it
               {"read", {"PK"}},               // the library
               {"fopen", {"PK", "LK"}},        // the tool's integrity value, before each signing
-              {"fcntl", {"PK", "PK", "LK"}},  // a copy of the library's descriptor; both signings
-              {"readlink", {"PK", "LPK"}},    // the libraries' directory; a message
+              {"fcntl", {"PK", "PK", "LK"}},  // a copy of the library's descriptor; each signing
+              {"readlink", {"PK", "LPK"}},    // the libraries' directory; ReportMissingLocation
               {"fstatvfs", {"LPK"}},          // the file system then counts as writable
               {"fgetxattr", {}}});            // the tool calls it only for JARs
 }
@@ -217,7 +218,7 @@ TEST(FailedCalls, LeaveADifferentLibraryUnsigned) {
 #define HAS_OWN_MALLOC false
 #endif
 
-// The sanitizer has its own allocator, which the injector cannot make fail.
+// AddressSanitizer has its own allocator, and the injector cannot make this allocator fail.
 #if !HAS_OWN_MALLOC
 
 bool IsAbort(const ToolEnd& ending) {
@@ -225,10 +226,10 @@ bool IsAbort(const ToolEnd& ending) {
 }
 
 // Makes each request for memory fail, one per run. A C++ container that gets no memory aborts, so a
-// run is allowed to end with an abort. The grants of such a run must be the first letters of `all`,
-// and at least as many as in each earlier run that aborted. In any other run, the tool and its
-// libraries handle the missing memory: the run must end normally, and its grants must be one of
-// `ways`. In the last run no request fails, and the grants must be `all`.
+// run may end with an abort. The grants of an aborted run must be the start of `all`. They must not
+// be shorter than those of an earlier aborted run. A run with a failed request may also end
+// normally, if the tool and its libraries handle the missing memory. The grants of this run must be
+// one of `ways`. In the last run, no request fails, and the grants must be `all`.
 void ExpectRunsWithoutMemory(Installed& file, const std::string& all,
                              const std::set<std::string>& ways) {
   constexpr int kMostCalls = 20000;
@@ -255,9 +256,10 @@ void ExpectRunsWithoutMemory(Installed& file, const std::string& all,
 
 TEST(FailedAllocations, GiveAGoodPackageOnlyTheAllowedGrants) {
   Installed file = GoodPackage();
-  // The meaning of the texts in the list. "": nothing is verified. "PK" and "LK": the integrity
-  // value cannot be read before the first or the second signing. "LP": the permission is not found.
-  // "LPN": the package's name is empty. "LPK": the missing memory has no effect.
+  // The list has these texts. "": nothing is verified. "PK": the integrity value cannot be read
+  // before the library is signed. "LK": the value cannot be read before the package is signed.
+  // "LP": the permission is not found. "LPN": the package's name is empty. "LPK": the missing
+  // memory has no effect.
   ExpectRunsWithoutMemory(file, "LPK", {"", "PK", "LK", "LP", "LPN", "LPK"});
 }
 

@@ -104,7 +104,7 @@ TEST(RunProgram, ProgramHasItsStreamsEvenIfThisProcessHasNone) {
   EXPECT_EQ(streams, "/dev/null\n/dev/null\n/dev/null\n");
 }
 
-// Runs cp, because a shell would unblock signals itself.
+// Runs cp and not a shell, because some shells unblock signals.
 TEST(RunProgram, ProgramHasNoBlockedSignals) {
   sigset_t some, before;
   sigemptyset(&some);

@@ -1,4 +1,4 @@
-// Tests the tool's command line, the files that the tool leaves alone, and a run without a
+// Tests the tool's command line, the files that the tool does not look at, and a run without a
 // simulated phone.
 #include <gtest/gtest.h>
 
@@ -46,7 +46,7 @@ TEST_F(CommandLine, MissingFileEndsTheRunSilently) {
   EXPECT_EQ(run.status, 4);  // the file was not looked at
 }
 
-// In its own user namespace, the tool has no right to another user's files, even as root.
+// Root can read any file. In a user namespace of its own, the tool does not have this right.
 TEST_F(CommandLine, UnreadableFileEndsTheRunSilently) {
   if (!CanMakeNamespaces()) GTEST_SKIP() << kNoNamespaces;
   std::filesystem::permissions(apk_, std::filesystem::perms::none);
@@ -85,9 +85,9 @@ TEST_F(CommandLine, FileOnAWritableFileSystemIsSigned) {
   EXPECT_EQ(run.status, 0);  // a missing library is not refused
 }
 
-// The log that the workstation's log library prints, without the times and the process IDs: for
-// each record a letter for the priority, then the text. Up to API level 29, the library prints the
-// tag before the time. Later versions print it after the time.
+// Returns the log that the workstation's log library printed. Keeps only the letter of the priority
+// and the text of each record. Up to API level 29, the library prints the tag before the time.
+// Later versions print the tag after the time.
 std::string WorkstationLog(const std::string& errors) {
   const std::string when = "[0-9]+-[0-9]+ [0-9:.]+ +[0-9]+ +[0-9]+ ";
   return std::regex_replace(

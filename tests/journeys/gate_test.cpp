@@ -56,7 +56,8 @@ ProcessResult Simulated(const Lines& words) {
   return RunProcess(command);
 }
 
-// The verdicts of the files, then the status. No phone's installer is asked, unless `words` say so.
+// The verdict of each file, then the simulator's exit status as "-> STATUS". The phone's installer
+// is asked only if `words` contain another --installer option.
 Lines Verdicts(Lines words) {
   words.insert(words.begin(), {"--installer=off", "--quiet"});
   const ProcessResult run = Simulated(words);
@@ -128,8 +129,8 @@ TEST(Signer, UnexpectedSignerIsShownInTextAndJournal) {
   EXPECT_NE(item["text"].get<std::string>().find(PublicKeyDigest("rsa-2048")), std::string::npos);
 }
 
-// For the newest phones, the signer of the package rotated-key has the key rsa-2048-other,
-// but the kernel gets the key rsa-2048.
+// The tool verifies the JAR signature of the package rotated-key, which is by the key rsa-2048. The
+// newest phones verify a signature of a newer scheme, which is by the key rsa-2048-other.
 TEST(Signer, KeyOfANewerSchemeMustBeExpectedToo) {
   const Lines first = {"--signer", ModulusDigest("rsa-2048")};
   const auto verdicts = [&](const Lines& more) {
@@ -165,8 +166,8 @@ TEST(Signer, TrustedJarMatchesNoExpectedSigner) {
 TEST(FilesOfOnePackage, MustHaveOneSigner) {
   EXPECT_EQ(Verdicts({Apk("apksigner-sha256-2048"), Apk("apksigner-sha1-2048")}),
             Lines({"SIGNED", "SIGNED", "-> 0"}));
-  // The files are compared in the order of the command line, even if several are processed at a
-  // time.
+  // The files are compared in the order of the command line, even if several are processed at the
+  // same time.
   for (const char* jobs : {"--jobs=1", "--jobs=4"}) {
     EXPECT_EQ(Verdicts({jobs, Apk("apksigner-sha256-4096"), Apk("apksigner-sha256-2048"),
                         Apk("apksigner-sha1-4096")}),
@@ -232,13 +233,12 @@ TEST(Warning, AppearsForShortKeyOrDebugCertificate) {
   EXPECT_EQ(WarningsOf(MakePackage(options)), Lines({"debug-key"}));
 }
 
-// The expected digests and sizes are those of coreutils and openssl.
 TEST(Verdict, DescribesFileToolSignerAndCure) {
   const auto sha256 = [](const std::string& file) {
     return RunProcess({"sha256sum", file}).output.substr(0, 64);
   };
-  // Under an emulator, ToolPath() is a script. The programs are in the directory bin, beside the
-  // script's directory.
+  // Under an emulator, ToolPath() is a script. The tool itself is in the directory bin, which is
+  // beside the script's directory.
   std::filesystem::path tool = ToolPath();
   if (AreProgramsEmulated()) tool = tool.parent_path() / "../bin/apktoolkit";
   const std::string apk = Apk("changed-dex");

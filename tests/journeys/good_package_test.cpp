@@ -1,5 +1,5 @@
-// Good packages: the files that are signed, their payloads, the key that is registered, and the
-// order of these steps.
+// Good packages: which files are signed, with which payloads, which key is registered, and in which
+// order.
 #include <gtest/gtest.h>
 
 #include <filesystem>
@@ -13,7 +13,7 @@ namespace {
 
 const Bytes kLibrary = ToBytes("\177ELF foo");
 
-// A good package with this one native library.
+// The options of a good package with classes.dex and one native library, the entry `entry_name`.
 PackageOptions WithLibrary(const std::string& entry_name) {
   PackageOptions options;
   options.entries = {{"classes.dex", ToBytes("dex\n035")}, {entry_name, kLibrary}};

@@ -51,8 +51,8 @@ Bytes KeyBlock(const std::string& path) {
   return block;
 }
 
-// The timeline of a run for a plain JAR, up to the event with the kernel's answer, which says
-// whether the kernel trusts the JAR.
+// The timeline of a run for a plain JAR, up to the "verify" event. `refusal` is 0 if the kernel
+// trusts the JAR, else the kernel's errno.
 std::string JarUpToVerify(const std::string& path, int refusal = 0) {
   return Timeline({Log(6, "Can't extract Android Manifest: Entry not found\n"),
                    Log(4, "VeltSignJni starts: 3.\n"),
@@ -251,7 +251,8 @@ TEST(FileThatIsNotAnArchive, TextFileWithTheAttributeIsNotRegistered) {
   EXPECT_EQ(run.status, 1);
 }
 
-// The zip library's result for a file that it does not open, as the tool writes it: "CODE: TEXT".
+// The zip library's result for a file that the library does not open, in the form of the tool's
+// log: "CODE: TEXT".
 std::string ZipRefusal(const std::string& path) {
   const int fd = open(path.c_str(), O_RDONLY | O_CLOEXEC);
   ZipArchiveHandle archive = nullptr;

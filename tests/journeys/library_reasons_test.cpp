@@ -1,4 +1,4 @@
-// Tests the simulator's texts for unsigned libraries of real packages.
+// Tests the lines of the simulator's report for native libraries that the tool does not sign.
 #include "journeys/reason.h"
 
 #include "support/package.h"
@@ -38,8 +38,8 @@ TEST_F(Reason, LibraryInASubdirectoryOfItsAbiIsReported) {
             "installers do not extract it to lib/arm64/sub/libx.so, where the tool looks");
 }
 
-// A phone installs the libraries of one processor. Without --install=all, the simulator lays out
-// (extracts) only these. The other libraries do not count as refused.
+// A phone's installer extracts the libraries of only one ABI. Without --install=all, the simulator
+// does the same. Libraries of other ABIs do not count as refused, even with --strict.
 TEST_F(Reason, LibrariesOfAnotherProcessorAreNotLaidOut) {
   Take("apksigner-sha256-2048");
   Do("rm -r lib");
@@ -57,7 +57,8 @@ TEST_F(Reason, LibrariesOfAnotherProcessorAreNotLaidOut) {
   EXPECT_EQ(Told(4, {"--install=all", "--strict"}).back(), "-> 0");
 }
 
-// With --strict, a library that no installer puts beside the package counts as refused.
+// Installers do not extract a library from a subdirectory of its ABI. With --strict, the library
+// then counts as refused.
 TEST_F(Reason, StrictRefusesALibraryThatNoInstallerExtracts) {
   MakePackage(WithLibraries({{"lib/arm64-v8a/libx.so", ToBytes("x")},
                              {"lib/arm64-v8a/sub/liby.so", ToBytes("y")}}))
@@ -66,8 +67,9 @@ TEST_F(Reason, StrictRefusesALibraryThatNoInstallerExtracts) {
   EXPECT_EQ(Told(1, {"--install"}).back(), "-> 0");
 }
 
-// A store delivers a package without libraries beside it. The function Told always passes
-// --install=no first. The test's own --install option overrides it.
+// A store delivers a package without libraries beside it. The function Told passes --install=no to
+// the simulator before the options of the test. An --install option of the test overrides
+// --install=no.
 TEST_F(Reason, LibrariesMissingBesideThePackageAreReported) {
   Take("apksigner-sha256-2048");
   Do("rm -r lib");
@@ -88,8 +90,9 @@ TEST_F(Reason, LibrariesMissingBesideThePackageAreReported) {
   EXPECT_EQ(Told(4, {"--install"})[2], "  ✓ lib/arm64/libvault.so  signed");
 }
 
-// If neither lib/arm64 nor lib/arm is beside a package, the simulator lays out the package even
-// without an --install option: it extracts the libraries as a phone's installer does.
+// Without an --install option, the simulator looks for lib/arm64 and lib/arm beside this package.
+// If neither exists, the simulator lays out a copy of the package: it extracts the libraries beside
+// the copy, as an installer does.
 TEST_F(Reason, PackageWithoutLibrariesBesideItIsLaidOut) {
   Take("apksigner-sha256-2048");
   Do("rm -r lib");

@@ -1,5 +1,5 @@
-// Directories and lists of files, as a pipeline passes them: the files that the tool is run for,
-// and how they are reported and counted.
+// Passes directories and lists of files to apktoolkit-sim, as a pipeline does. Checks for which
+// files the tool is run, and how apktoolkit-sim reports and counts these files.
 #include <gtest/gtest.h>
 
 #include <filesystem>
@@ -15,8 +15,8 @@ namespace {
 namespace fs = std::filesystem;
 using Lines = std::vector<std::string>;
 
-// A directory `good` with a good package, and a directory `shop` with two good packages, one
-// unsigned package and one text file.
+// Makes two directories. `good` has one good package. `shop` has one good package, one unsigned
+// package, one text file, and a directory `more` with one good package.
 class ManyFiles : public testing::Test {
  protected:
   ManyFiles() {
@@ -39,7 +39,8 @@ class ManyFiles : public testing::Test {
     return RunProcess(command, directory_.path());
   }
 
-  // The verdicts without the signer, then the status, then the text on standard error.
+  // Each line of the output up to its first three blanks, then the exit status, then the text on
+  // standard error, if any.
   static Lines Told(const ProcessResult& run) {
     Lines lines;
     std::istringstream text(run.output);
@@ -124,7 +125,7 @@ TEST_F(ManyFiles, EmptyOrMissingListGivesStatus2) {
 }
 
 // Each run extracts the package's libraries into a new temporary directory. No output contains the
-// name of this directory, so only the process ID and the time of the run differ.
+// name of this directory. Only the process ID and the time differ, and the script replaces both.
 TEST_F(ManyFiles, TwoRunsOverOneFileGiveTheSameOutput) {
   const std::string both =
       "for run in 1 2; do sim --journal $run.journal --html $run.html good/base.apk; "
@@ -148,8 +149,9 @@ TEST_F(ManyFiles, TwoRunsOverOneFileGiveTheSameOutput) {
   }
 }
 
-// A file name that contains the placeholder <install> is shown unchanged. The placeholder is not
-// ambiguous, because a resolved path begins with a slash.
+// A file name that contains the placeholder <install> is shown unchanged. In the journal, only the
+// `path` of a file in the temporary directory begins with the placeholder. The `path` of the user's
+// file begins with a slash.
 TEST_F(ManyFiles, NameThatLooksLikeThePlaceholderIsShownUnchanged) {
   const ProcessResult run =
       Do("mkdir '<install>'; cp good/base.apk '<install>'/; sim --journal journal "

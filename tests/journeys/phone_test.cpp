@@ -1,4 +1,5 @@
-// One good package on phones with faults: different answers of the kernel and of libzu.
+// Runs one good package on simulated phones. The phones differ in the integrity value, and in the
+// answers of the kernel and of libzu.
 #include <gtest/gtest.h>
 
 #include <cerrno>
@@ -20,7 +21,7 @@ class GoodPackageOn : public testing::Test {
     MakePackage(options).WriteTo(apk_);
   }
 
-  // The end of every timeline when libzu reports success.
+  // The last events of a run in which libzu returns 0.
   std::string RegisteredAndExit() const {
     return Timeline({Register(3, apk_, "com.example.app", ModulusOf("rsa-2048")),
                      Log(4, "ZuAddCertificate: ZuNewCertificate return 0.\n"), Exit(0)});
@@ -31,15 +32,16 @@ class GoodPackageOn : public testing::Test {
   const std::string library_ = directory_.Write("lib/arm64/libfoo.so", ToBytes("\177ELF foo"));
 };
 
-// The events of one refused signature. `kernels_part` has the kernel's events, which come before
-// the tool's message.
+// The events of one failed attempt to sign a file. `kernels_part` has the events between the tool's
+// two messages: the reads of the integrity value, and the kernel's refusal if the tool asked.
 std::string Refusal(const std::string& kernels_part, int error) {
   return Timeline({Log(4, "VeltSignOat: Apk case.\n"), kernels_part,
                    Log(6, "VELT can't sign a file (result=10000, errno " + std::to_string(error) +
                               ": " + strerror(error) + ").\n")});
 }
 
-// The events of two refused signatures. `library_part` and `package_part` have the kernel's events.
+// The events of VeltSignJni and VeltSign if both attempts to sign fail: first the library, then the
+// package. `library_part` and `package_part` are the arguments `kernels_part` of Refusal.
 std::string BothRefused(const std::string& library_part, const std::string& package_part,
                         int error) {
   return Timeline({LibraryStep({Refusal(library_part, error)}),

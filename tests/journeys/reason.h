@@ -23,9 +23,10 @@ inline std::string ByRsa2048() {
 
 inline constexpr size_t kAll = 1000;
 
-// Returns the first `lines` lines of `all`, and its last line, the status. If something was
-// refused, the first line, the verdict, repeats the reason of the first line that has a cross (✗).
-// This function checks the repeated reason, and removes it.
+// Returns the first `lines` lines of `all`, and the last line of `all`, which is the status. The
+// first line is the verdict. If a later line starts with a cross (✗), the verdict repeats the
+// reason of the first line with a cross. This function checks the repeated reason. It then removes
+// this reason and the rest of the verdict's line.
 inline Lines WithoutReason(size_t lines, Lines all) {
   const auto is_cross = [](const std::string& line) { return line.rfind("  ✗ ", 0) == 0; };
   const auto cross = std::find_if(all.begin(), all.end(), is_cross);
@@ -49,12 +50,13 @@ inline Lines WithoutReason(size_t lines, Lines all) {
   return all;
 }
 
-// A copy of a package that make_golden_packages made, with its libraries beside it. Most tests
-// damage their copy.
+// A test that runs the simulator in its own directory, usually on a copy of a package that
+// make_golden_packages made.
 class Reason : public testing::Test {
  protected:
-  // Copies `name`, one of these packages or a directory with a package and its libraries, into the
-  // test's directory.
+  // Copies a result of make_golden_packages into the test's directory. If `name` is a package, its
+  // copy is named base.apk. If `name` is a directory, its contents are copied: a package named
+  // base.apk and, if there are any, its extracted libraries.
   void Take(const std::string& name) {
     const std::filesystem::path source = std::filesystem::path(GOLDEN_PACKAGES) / name;
     if (std::filesystem::is_directory(source)) {
@@ -64,7 +66,7 @@ class Reason : public testing::Test {
     }
   }
 
-  // Runs a shell command in the package's directory. The test fails if the command fails.
+  // Runs a shell command in the test's directory. The test fails if the command fails.
   void Do(const std::string& command) const {
     const ProcessResult run = RunProcess({"bash", "-e", "-c", command}, directory_.path());
     ASSERT_EQ(run.status, 0) << run.errors;

@@ -107,7 +107,7 @@ TEST_F(Reason, CureByAnotherKeyStatesItsDisadvantage) {
 }
 
 // By default, keytool signs the certificate of an RSA key of 3584 bits with SHA-384. The package
-// keytool-sha256 shows that the cure helps.
+// keytool-sha256 is signed with the same key, after make_golden_packages applied the cure.
 TEST_F(Reason, CertificateSignedWithSha384IsReported) {
   Take("keytool-sha384");
   const Lines told = Told(5);
@@ -129,8 +129,8 @@ TEST_F(Reason, SignatureOverSha512IsReported) {
             "v1.5 with MD5, SHA-1 or SHA-256");
 }
 
-// Developers' tools make no key with the public exponent 1. The test therefore writes a signature
-// block with such a key itself: another owner's modulus, without the private key.
+// Developers' tools make no key with the public exponent 1 or -1. The test therefore writes the
+// signature block itself. The block has the modulus of rsa-2048, but the private key is not needed.
 TEST_F(Reason, ExponentOf1OrMinus1IsReported) {
   Take("apksigner-sha256-2048");
   Do("unzip -q base.apk META-INF/CERT.SF");
@@ -360,7 +360,8 @@ TEST_F(Reason, PackageWithAKeyOf512BitsIsSignedWithAWarning) {
             told.end());
 }
 
-// The command in the cure makes another certificate for the same key, and the tool accepts it.
+// The command in the cure makes another certificate for the same key. The tool accepts this
+// certificate.
 TEST_F(Reason, CertificateWithSha384IsCuredByTheShownCommand) {
   Take("keytool-sha384");
   const Lines told = Told(10);

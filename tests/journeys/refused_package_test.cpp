@@ -1,5 +1,5 @@
-// Packages that were changed after they were signed, or that lack a part: what the tool refuses,
-// and for which reasons.
+// Runs the tool on packages that were changed after they were signed, or that lack a part. Tests
+// what the tool refuses, and for which reasons.
 #include <gtest/gtest.h>
 #include <sys/stat.h>
 
@@ -41,7 +41,7 @@ class RefusedPackage : public testing::Test {
     EXPECT_EQ(run.status, 1);
   }
 
-  // VeltSignJni, the first step, refuses the dex file and logs `reasons`. By then the tool knows
+  // VeltSignJni, the first step, refuses the dex file and logs `reasons`. The tool has already read
   // that the package asks for the permission, so the last step, the registration, also logs an
   // error.
   void ExpectDexFileRefusedAfter(std::initializer_list<std::string> reasons) const {
@@ -57,12 +57,14 @@ class RefusedPackage : public testing::Test {
     EXPECT_EQ(run.status, 1);
   }
 
-  // The library is missing, which is not a refusal. The package is signed and registered.
+  // The library is missing, but a missing library is not refused. The package is signed, and its
+  // key is registered.
   void ExpectLibraryAbsentAfter(std::initializer_list<std::string> reasons) const {
     ExpectGoodPackageWith(Timeline(reasons), 0);
   }
 
-  // The library is refused for these reasons, but the package is signed and registered.
+  // The tool refuses the library and logs `reasons`. The package is signed, and its key is
+  // registered.
   void ExpectLibraryRefusedAfter(std::initializer_list<std::string> reasons) const {
     ExpectGoodPackageWith(Timeline(reasons), 1);
   }
@@ -70,7 +72,8 @@ class RefusedPackage : public testing::Test {
   // Nothing is refused: the library and the package are signed, and the key is registered.
   void ExpectAllSigned() const { ExpectGoodPackageWith(SignedLibrary(library_), 0); }
 
-  // `library` has the events of the library. After them, the package is signed and registered.
+  // `library` has the events of the library. After these events, the package is signed, and its key
+  // is registered.
   void ExpectGoodPackageWith(const std::string& library, int status) const {
     const Simulation run = Run();
     EXPECT_EQ(run.timeline,
@@ -174,9 +177,9 @@ TEST_F(TamperedPackage, SecondDexFileIsNotLookedAt) {
 TEST_F(TamperedPackage, CertificateOfAnotherIssuerIsRefused) {
   package_ = MakePackage([] {
     PackageOptions options = Options();
-    // The issuer has the smaller modulus, so its signature is a number below the subject's modulus.
-    // The tool therefore refuses the padding and logs 7. If the number were not below the modulus,
-    // the tool would log 5.
+    // The issuer's modulus is smaller than the subject's modulus. The issuer's signature is
+    // therefore a number below the subject's modulus, and the tool refuses the padding and logs 7.
+    // If the signature were not below the subject's modulus, the tool would log 5.
     options.block.key = "rsa-2048-other";
     options.block.issuer_key = "rsa-2048";
     return options;

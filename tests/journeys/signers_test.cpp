@@ -107,8 +107,9 @@ TEST(SignerWarnings, SeveralSignersGiveAWarning) {
             "  ! it has more than one signer; the kernel gets the key of META-INF/CERT.SF alone");
 }
 
-// Newer phones use the package's new key, and this tool uses the old one. apksigner writes the new
-// key into the newest scheme that it knows: v3, or v3.1 from version 32 of apksigner on.
+// Phones that know the newest scheme use the package's new key. The tool uses the old key, that of
+// the JAR signature. apksigner signs with the new key in the newest scheme that apksigner knows:
+// v3, or v3.1 from version 32 of apksigner on.
 TEST(SignerWarnings, RotatedKeyGivesAWarning) {
   const std::string told = Told("rotated-key");
   const std::string schemes = LineWith(told, "schemes: ");

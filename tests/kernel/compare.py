@@ -7,9 +7,9 @@ journals. Each directory KERNEL has `results`, which tests/kernel/init wrote, an
 if anything differs: an event, its place in the order, a line of output, or a result of the probe
 (tests/simulator/phone/probe.cpp). An event is a log record, a reading of the integrity value, a
 call to the kernel (with its payload, result and errno), a registration, or an exit status. Also
-fails if a signed file on the disk does not keep its payload and its digest, or if the kernel
-complained. With an SELinux policy, also fails if the tool's domain was not entered once per run
-that the policy confines."""
+fails if the kernel complained, or if the disk lacks the payload of a signed file or the digest of
+the bytes that were signed. With an SELinux policy, the number of entries into the tool's domain
+must equal the number of confined runs (tests/kernel/runs.py)."""
 
 import difflib
 import hashlib
@@ -23,17 +23,17 @@ import tempfile
 import runs
 
 PRIORITIES = {"V": 2, "D": 3, "I": 4, "W": 5, "E": 6, "F": 7}
-# The start of a record that the workstation's liblog writes to standard error: tag, priority, date,
-# time, two numbers.
+# A log record that the workstation's liblog writes to standard error: tag, priority, date, time,
+# process id, thread id, text.
 RECORD = re.compile(r"(\S+) ([VDIWEF]) \d\d-\d\d \d\d:\d\d:\d\d +\d+ +\d+ (.*)", re.S)
-# Events that only the simulator has. Output is compared separately, because programs write it only
-# when they end.
+# Events that only the simulator records. The lines of output ("stdout") are compared separately,
+# because a run on a real kernel does not record their position among the events.
 OF_SIMULATION = {"journal", "start", "attached", "verdict", "stdout"}
 SEEN_BY_MODULE = {"integrity", "sign", "verify"}
 INFORMATION = 4  # the workstation's liblog drops records of a lower priority
 COMPLAINT = re.compile(r"BUG:|WARNING:|Oops|Call [Tt]race|refcount_t|general protection|avc: +denied")
-# A kernel with an SELinux policy prints such a line when the installer's domain starts a program of
-# the tool.
+# The message of a kernel with an SELinux policy when a process of the installer's domain starts a
+# program in the tool's domain.
 ENTRY = re.compile(r"avc: +granted +{ transition } .* scontext=u:r:installd:s0 tcontext=u:r:apktoolkit:s0 ")
 
 
@@ -73,7 +73,7 @@ class Kernel:
 
 
 def simulated(expected, run):
-    """The events of a simulated run that a run on a real kernel also has, and the run's output."""
+    """The events of a simulated run that a run on a real kernel also has, and the simulated output."""
     lines = (expected / f"{run.name}.journal").read_text().splitlines()
     events = [json.loads(line) for line in lines]
     output = "".join(event["text"] for event in events if event["event"] == "stdout")
@@ -106,16 +106,17 @@ def probe_answers(kernel, files, run):
 
 
 def last_payloads(kernel, all_runs):
-    """The payload that each file was last signed with, by its path."""
+    """The payload that each file was last signed with, by the file's path."""
     return {event["path"]: bytes.fromhex(event["payload"])
             for run in all_runs for event in kernel.events(run)
             if event["event"] == "sign" and event["result"] == 0}
 
 
 def check_disk(kernel, files, all_runs):
-    """Checks that the disk keeps the digest and the payload of each signed file. e2fsprogs reads
-    both. A run changes changed.jar after it was signed, so the kept digest must differ from the
-    file's. Returns the number of signed files."""
+    """Checks that the disk keeps the payload of each signed file, and the digest of the bytes that
+    were signed. Reads the disk with debugfs of e2fsprogs. A run changes changed.jar after this file
+    was signed, so the kept digest must differ from the digest of the file's present bytes. Returns
+    the number of signed files."""
     payloads = last_payloads(kernel, all_runs)
     with tempfile.TemporaryDirectory() as name:
         directory = pathlib.Path(name)
@@ -139,7 +140,8 @@ def check_disk(kernel, files, all_runs):
 
 
 def check_domain(kernel, all_runs):
-    """With an SELinux policy, checks that the tool's domain was entered once per confined run."""
+    """With an SELinux policy, checks that the number of entries into the tool's domain equals the
+    number of confined runs."""
     entered = sum(bool(ENTRY.search(line)) for line in kernel.messages)
     confined = sum(run.confined for run in all_runs)
     if kernel.has_policy and entered != confined:
@@ -147,7 +149,8 @@ def check_domain(kernel, all_runs):
 
 
 def summary(expected, run):
-    """The number of each answer of the kernel and of libzu, such as "3 signed, 1 registered"."""
+    """Counts the answers of the simulated kernel and of libzu in this run. The result is a text such
+    as "3 signed, 1 registered"."""
     events, _ = simulated(expected, run)
     answers = {}
     for event in events:

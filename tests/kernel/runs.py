@@ -23,15 +23,15 @@ GOOD = "golden/apksigner-sha256-2048"
 # The probe's calls (tests/simulator/phone/probe.cpp). The tool makes only a few of them, but the
 # simulated kernel must answer all of them like a real one.
 PROBES = {
-    # A phone's kernel trusts the JARs of its system. The kernel under test does not, so the probe
-    # first signs the JARs.
+    # A phone's kernel trusts the JARs of the phone's system. The kernel under test trusts only
+    # files that it signed. The probe therefore signs the JARs below; later runs use them.
     "trust": ["open jars/trusted.jar", "sign 5 0000", "open jars/trusted-marked.jar", "sign 6 0000",
               "open jars/changed.jar", "sign 7 0000", "open jars/refused.jar", "sign 8 0000",
               "verify 5"],
     "calls": ["verify 3", "sign 3 0200abcd", "verify 3", "sign64 3 0000", "verify64 3",
-              # the kernel reads exactly as many bytes as the length says
+              # the kernel reads exactly as many bytes as the payload's length says
               "sign 3 0100abcdef", "sign 3 d007" + "5a" * 2000,
-              # memory that cannot be read, or ends within the payload
+              # payloads in memory that cannot be read, or of which only the start can be read
               "sign 3 null", "sign 3 wild", "sign 3 cut",
               # descriptors that are not open, or that only name a file (O_PATH)
               "sign 700 0000", "sign -1 0000", "sign 700 null", "verify 700", "verify -1",
@@ -175,7 +175,8 @@ PARAMETERS = {"--integrity": "1f", "--sign-errno": "0", "--verify-errno": "ENOKE
 
 
 def guest_lines(run, before):
-    """The run as calls of the functions of tests/kernel/init; `before` is the run before it."""
+    """The lines of the script OUT/runs for this run; `before` is the previous run. The functions
+    that the lines call are in tests/kernel/init."""
     if run.feature and not before.feature:
         yield "load_feature"
     if run.before:

@@ -1,4 +1,4 @@
-// Tests each reason except kUnknown with an input that gets this reason. Also tests the lines in
+// Tests each reason except kUnknown with an input that leads to the reason. Also tests the lines in
 // the log and the release of the archive.
 #include "library/verification.h"
 
@@ -20,8 +20,8 @@ using ApkTools::Verification;
 
 namespace {
 
-// The reason why the file is refused. The parser of signature blocks prints to standard output, and
-// the log prints to standard error. The test discards both outputs.
+// Returns the reason for a file with the bytes `content`. The parser of signature blocks prints to
+// standard output, and the log prints to standard error. ReasonOf discards both outputs.
 Reason ReasonOf(const Bytes& content) {
   const MemoryFile file(content);
   testing::internal::CaptureStdout();
@@ -93,8 +93,8 @@ TEST(VerificationReason, SaysWhyTheFileIsNotAPackage) {
   EXPECT_EQ(ReasonOf(WithUnreadable(kAndroidManifestName)), Reason::kAndroidManifestUnreadable);
 }
 
-// An entry whose name only begins with AndroidManifest.xml or META-INF/MANIFEST.MF is neither of
-// these manifests.
+// AndroidManifest.xml.bak does not count as AndroidManifest.xml. META-INF/MANIFEST.MF.bak does not
+// count as META-INF/MANIFEST.MF.
 TEST(VerificationReason, DependsOnTheWholeNameOfAnEntry) {
   PackageOptions options = PlainJar();
   options.entries.push_back({"AndroidManifest.xml.bak", ToBytes("x")});
@@ -159,7 +159,8 @@ TEST(VerificationReason, EachReasonHasItsOwnText) {
   EXPECT_STREQ(TextOf(Reason::kManifestRefused), "its manifest does not match the signature file");
 }
 
-// A verification that is made while another one exists has its own reason.
+// Two verifications exist at the same time. The second verification does not change the reason of
+// the first. A later log line changes neither reason.
 TEST(VerificationReason, TwoVerificationsHaveTheirOwnReasons) {
   const MemoryFile bad(WithTampered(kManifestName).Build());
   const MemoryFile good(MakePackage().Build());

@@ -1,6 +1,7 @@
 // Lists a manifest whose sections are not sorted, and finds one section. With the argument "hash",
-// computes the C++ library's hash of the text instead. This hash overflows, so the trap that
-// tests/overflow/run compiles in must end the program.
+// computes the C++ library's hash of the manifest instead. tests/overflow/run compiles this program
+// with traps for integer overflows. The computation of the hash overflows, so a trap must end the
+// program.
 #include <cstdio>
 #include <functional>
 #include <string>

@@ -49,7 +49,7 @@ def main():
             bad = compiled(directory, "bad", f"{declaration} int Later() {{ return {call}; }}")
             result = compare(good, own, bad)
             if result.returncode != 1 or symbol not in result.stdout or "read" in result.stdout:
-                problems.append(f"{symbol} is not reported, or read is reported too: {result.stdout}")
+                problems.append(f"{symbol} is not reported, or the function read is reported too: {result.stdout}")
         if compare().returncode == 0:
             problems.append("scripts/android --symbols succeeds without objects")
     return report(problems, "the function compare in scripts/android")

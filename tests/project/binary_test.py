@@ -1,5 +1,5 @@
 #!/usr/bin/env python3
-"""Runs scripts/check-binary on programs that each lack one part of the hardening.
+"""Tests scripts/check-binary with programs that have the hardening or lack one part of it.
 
 Argument: the compiler.
 """

@@ -1,7 +1,7 @@
 #!/usr/bin/env python3
 """Reads Android.bp files: their modules, and how a platform's build compiles each source.
 
-blueprint.py FILE... prints for every source of these files its module, its path and the compiler's flags.
+blueprint.py FILE... prints the module, the path and the compiler's flags of every .cpp source in these files.
 """
 
 import re
@@ -16,8 +16,8 @@ DEFAULT_STANDARD = "gnu++14"
 
 
 class Blueprint:
-    """The modules and variables of a file. A module is a dictionary, which has the module's type
-    under "type"."""
+    """The modules and variables of a file. A module is a dictionary of its properties. Blueprint adds
+    the key "type" for the module's type, and the key "directory" for the file's directory."""
 
     def __init__(self, path):
         self.path = path
@@ -80,21 +80,21 @@ def sources(module):
 
 
 class Tree:
-    """The modules of several files, which refer to one another by name."""
+    """The modules of several files. A module can name other modules in "defaults" and "static_libs"."""
 
     def __init__(self, paths):
         self.modules = [module for path in paths for module in Blueprint(path).modules]
 
     def flags(self, module):
-        """The compiler flags that the files give for each source of the module."""
+        """The compiler flags that the module's properties set for each of its sources."""
         module = self.with_defaults(module)
         directories = self.include_directories(module)
         return [f"-std={module.get('cpp_std', DEFAULT_STANDARD)}", *module.get("cflags", []),
                 *(f"-I{directory}" for directory in directories)]
 
     def with_defaults(self, module):
-        """The module with the properties of the modules in its "defaults". Their lists come before
-        the module's own lists."""
+        """The module, merged with the modules in its "defaults". A list of the module is appended to
+        the lists of the defaults. Any other property of the module replaces theirs."""
         merged = {}
         for part in [*map(self.with_defaults, self.named(module.get("defaults", []))), module]:
             for key, value in part.items():
@@ -110,7 +110,7 @@ class Tree:
                       for name in library.get("export_include_dirs", [])]
 
     def named(self, names):
-        """The modules of these names that are the project's own, not the platform's."""
+        """The modules in these files with these names. A name of a platform's module gives none."""
         return [module for name in names for module in self.modules if module["name"] == name]
 
 

@@ -17,7 +17,7 @@ import zipfile
 from sources import ROOT, Shell, report, shown_commands
 
 PAGE = ROOT / "docs/guide.md"
-DIRECTORY = "/data/app/vault"  # replaces the path of this test's directory on the page
+DIRECTORY = "/data/app/vault"  # the page has this path in place of the test's temporary directory
 BLOCK = re.compile(r"^```\n(\$ .*?)\n```$", re.M | re.S)
 
 # Texts that change with each new certificate, or with the compiler that built libvault.so. The page
@@ -54,7 +54,8 @@ def settled(lines):
 
 
 def checked(block, shell):
-    """Returns the block with the current output of its commands."""
+    """Returns the block with the current output of its commands. Keeps the output on the page if it differs
+    from the current output only in the texts of VARIES."""
     lines = []
     for command, expected in shown_commands(block):
         shown = shell.run(command).stdout.replace(str(shell.directory), DIRECTORY).splitlines()

@@ -1,8 +1,8 @@
 #!/usr/bin/env python3
 """Checks that journals of real runs follow docs/journal.schema.json.
 
-Arguments: the directory of a good package that asks for its key to be registered, and the command
-line that starts apktoolkit-sim.
+Arguments: the directory of a good package that asks for the registration of its key, and the
+command line that starts apktoolkit-sim.
 """
 
 import json
@@ -66,8 +66,9 @@ def main():
     problems += [f"no run had the event {kind}" for kind in kinds - {kind for kind, _ in seen}]
     known = set(SCHEMA["$defs"]["verdict"]["properties"]["verdict"]["enum"])
     problems += [f"no run had the verdict {verdict}" for verdict in known - verdicts]
-    # Each member of an event is required, so the schema must refuse an event without one of them.
-    # One event of each kind is tried. An exit with a status and one with a signal are two kinds.
+    # Every member of an event is required, so the schema must refuse an event that lacks a member.
+    # One event of each kind is tried. An exit event with a status and an exit event with a signal
+    # are two kinds.
     for event in seen.values():
         for member in event:
             poorer = {key: value for key, value in event.items() if key != member}

@@ -1,6 +1,6 @@
 #!/usr/bin/env python3
-"""Installs the library into a temporary directory, and builds and runs the example there as
-examples/README.md shows. Compiles each installed header alone.
+"""Installs the static libraries and headers (cmake/Library.cmake) into a temporary directory, and
+builds and runs the example there as examples/README.md shows. Compiles each installed header alone.
 
 Arguments: the build tree, the compiler, and the directory of a good package.
 """
@@ -19,8 +19,8 @@ MARK = "== next command"
 
 
 def prepare(directory, build, package):
-    """Fills the directory in which the page's commands run: with the examples, the build tree, and
-    the packages that the page names."""
+    """Fills the directory in which the commands of examples/README.md run: with the examples, a
+    link to the build tree, and the packages that these commands use."""
     shutil.copytree(ROOT / "examples", directory / "examples")
     (directory / "build").mkdir()
     (directory / "build/release").symlink_to(build)
@@ -30,8 +30,8 @@ def prepare(directory, build, package):
 
 
 def run(commands, directory, compiler):
-    """Runs the commands in one shell, until one fails. Returns the output of each command, and the
-    problems."""
+    """Runs the commands in one shell, up to the first that fails. Returns the output of each
+    command that ran, and the problems."""
     script = "set -euo pipefail\n" + "\n".join(f"echo '{MARK}'; {command}" for command in commands)
     environment = {**os.environ, "HOME": str(directory), "CXX": compiler}
     result = subprocess.run(["bash", "-c", script], cwd=directory, env=environment, text=True,
@@ -43,8 +43,8 @@ def run(commands, directory, compiler):
 
 
 def page_problems(directory, compiler):
-    # The first command makes a build tree. This command is left out, because the test uses the
-    # build tree that it was given.
+    # The first command makes a build tree. This command is left out, because the caller passes a
+    # build tree to the test.
     blocks = re.findall(r"^```\n(\$ .*?)\n```$", (ROOT / "examples/README.md").read_text(), re.M | re.S)
     shown = [command for block in blocks for command in shown_commands(block)][1:]
     printed, problems = run([command for command, _ in shown], directory, compiler)

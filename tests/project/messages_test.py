@@ -1,10 +1,11 @@
 #!/usr/bin/env python3
-"""Writes parts of docs/messages.md from the sources: the priority and files of each message of the
-tool, and the tables of the simulator's reasons. Also writes the codes of the reasons to
-docs/journal.schema.json.
+"""Compares parts of docs/messages.md with the sources: the priority and files of each message of
+the tool, and the tables of the simulator's reasons. Also compares the codes of the reasons in
+docs/journal.schema.json. With --write, writes these parts from the sources instead.
 
-The explanation of each message is written by hand. The test fails if a message has no entry, if an
-entry has no message, or if the simulator looks for a text that the tool does not log.
+The explanation of each message is written by hand. The test fails if docs/messages.md has no entry
+for a message, or an entry for a message that the tool does not have. It also fails if the simulator
+looks for a text that the tool does not log.
 """
 
 import re
@@ -19,8 +20,8 @@ LITERALS = r'(?:"(?:[^"\\]|\\.)*"\s*)+'
 CALL = re.compile(r"\b(LogInfo|LogError|Fail)\(\s*(%s|k\w+)" % LITERALS)
 CONSTANT = re.compile(r"constexpr char (k\w+)\[\] =\s*(%s)" % LITERALS)
 
-# For each of these functions: the priority of its texts, and their prefix. Fail is a function of
-# crypto/pkcs7.cpp. It writes to standard output.
+# For each of these functions: the priority and the prefix of its texts. The function Fail of
+# crypto/pkcs7.cpp writes to standard output, without a priority.
 WRITERS = {
     "LogInfo": ("Info", ""),
     "LogError": ("Error", ""),
@@ -65,7 +66,7 @@ GROUPS = {"kNotLookedAt": "The tool did not look at the file",
           "kInstaller": "The installer of the phones",
           "kGate": "Demands of --signer and --werror, and of one signer for each package", "kWarning": "Warnings"}
 
-# Groups with causes that need not name a link of the chain (ChainLink). reasons_problems() has the
+# A cause of these groups need not name a link of the chain (ChainLink). reasons_problems() has the
 # other exceptions.
 UNBROKEN = {"kKernel", "kKey", "kInstaller", "kGate", "kWarning"}
 
@@ -122,7 +123,8 @@ def reasons_problems(rows, messages):
     return problems
 
 
-# A row of the texts that the simulator understands: meaning, text, captured part.
+# A row of the simulator's table of log texts: the meaning, the text, and the index of the
+# conversion to capture.
 LOG_LINES = ROOT / "simulator/run/log_lines.cpp"
 LOG_TEXT = re.compile(r"\{LogMeaning::k\w+,\s*(%s),\s*(\d+|kNothing)\}" % LITERALS)
 
@@ -140,7 +142,8 @@ def log_problems(messages):
     return problems
 
 
-# A row of the library's table: the start of a message, and the reason for it.
+# A row of the table in library/verification.cpp: the start of a message, and the reason that the
+# message gives.
 LIBRARY = ROOT / "library/verification.cpp"
 LIBRARY_TEXT = re.compile(r"\{(%s), Reason::k\w+\}" % LITERALS)
 
@@ -155,9 +158,9 @@ def library_problems(messages):
     return problems
 
 
-FIX = f"""an entry of {PAGE} is "### `TEXT`", an empty line, and what the message means;
-messages_test.py --write adds its priority and its files. The texts that the simulator looks for are in
-{LOG_LINES}, its reasons in {CAUSES}."""
+FIX = f"""an entry of {PAGE} is "### `TEXT`", an empty line, and the meaning of the message.
+messages_test.py --write adds the message's priority and files. The texts that the simulator looks for are
+in {LOG_LINES}. The simulator's reasons are in {CAUSES}."""
 
 
 def main():

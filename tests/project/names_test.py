@@ -20,8 +20,8 @@ LINK = re.compile(r"\]\(([^)#:]+)(?:#[^)]*)?\)")
 
 PAGE = ROOT / "docs/architecture.md"
 PATH = r"\w[\w/]*/\w+\.(?:cpp|h|md|py)"
-# The page names a function and its file in the steps of its picture, in the rows of its table, and
-# in its answers to questions.
+# docs/architecture.md names functions with their files in three parts: the steps of the picture
+# (STOP), the rows of the table (ROW), and the answers to questions (ANSWER).
 STOP = re.compile(rf"^[ |:v]*([\w:]+) +({PATH})", re.M)
 ROW = re.compile(rf"^\|[^|]*\| ([^|]*) \| ((?:`{PATH}`(?:, )?)+) \|$", re.M)
 ANSWER = re.compile(rf"`([\w:]+)`\s+in\s+`({PATH})`")
@@ -55,7 +55,7 @@ def test_and_link_problems():
             if not (page.parent / link).exists():
                 yield f"{page.relative_to(ROOT)} links to {link}, which does not exist"
     if count < 50:
-        yield f"only {count} tests are named: the pattern NAMED misses them"
+        yield f"the docs: the pattern NAMED finds only {count} tests, but must find at least 50"
 
 
 def test_name_problems():
@@ -80,7 +80,7 @@ def function_problems():
     yield from (f"docs/architecture.md: there is no {path}"
                 for path in re.findall(PATH, text) if not (ROOT / path).exists())
     if len(places) < 50:
-        yield f"docs/architecture.md names only {len(places)} functions: the patterns miss them"
+        yield f"docs/architecture.md: the patterns find only {len(places)} functions, but must find at least 50"
 
 
 if __name__ == "__main__":

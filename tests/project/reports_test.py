@@ -75,8 +75,8 @@ def run(simulator, directory, options, files):
 
 
 def junit_problems(verdicts, suites):
-    """Checks that each file has a case, and that the totals are right. The case of a file must pass
-    for status 0, fail for status 1, and be an error for any other status. If the first item of a
+    """Checks that each file has a test case, and that the totals are right. The test case of a file must
+    pass for status 0, fail for status 1, and be an error for any other status. If the first item of a
     verdict is refused and the status is not 3, the type of the failure or error must be the code of
     this item's reason."""
     cases = [case for suite in suites for case in suite]
@@ -85,10 +85,10 @@ def junit_problems(verdicts, suites):
         kinds = [type(result) for result in case.result]
         expected = {0: [], 1: [junitparser.Failure]}.get(verdict["status"], [junitparser.Error])
         if kinds != expected:
-            problems.append(f"{verdict['file']}: {verdict['verdict']} is {kinds}")
+            problems.append(f"{verdict['file']}: {verdict['verdict']}: the test case has {kinds}, and not {expected}")
         if kinds and verdict["items"][0]["state"] == "refused" and case.result[0].type != \
                 verdict["items"][0]["reason"] and verdict["status"] != 3:
-            problems.append(f"{verdict['file']}: the case has the type {case.result[0].type}")
+            problems.append(f"{verdict['file']}: the test case has the type {case.result[0].type}")
     counts = (suites.tests, suites.failures, suites.errors)
     expected = (len(verdicts), sum(verdict["status"] == 1 for verdict in verdicts),
                 sum(verdict["status"] > 1 for verdict in verdicts))
@@ -121,7 +121,8 @@ def sarif_problems(verdicts, log):
 
 
 def odd_files(package, directory):
-    """Copies of a package, under names with characters that are special in XML, JSON or URIs."""
+    """Copies of a package. Their names have characters that are special in XML, JSON or URIs, or bytes
+    that are not UTF-8."""
     for name in (b"a b&<>\"'.apk", b"]]>.apk", b"http:x?a#b%41.apk", b"line\nend\x01.apk", b"\xe9\xff.apk",
                  "\u202egr\u00fcn\ufffe\U0001f600.apk".encode()):
         path = directory / name.decode(errors="surrogateescape")

@@ -1,7 +1,7 @@
 #!/usr/bin/env python3
-"""Runs the commands of docs/store.md over a few hundred packages on this machine. Kills all of the
-work in the middle, and continues it. Each result must then be there exactly once. A journal that
-was cut off must not count as a result.
+"""Runs the commands of docs/store.md over a few hundred packages on this machine. Kills all jobs
+in the middle, and continues the work. The journals must then have the verdict on each package
+exactly once. A journal that was cut off must not get the name of its list.
 
 Arguments: the directory of the golden packages, and the command line that starts apktoolkit-sim.
 """
@@ -43,7 +43,7 @@ def commands():
 
 
 def prepare(golden, directory):
-    """Makes the store, a tree of packages. Returns the number of packages of each verdict."""
+    """Makes the store, a tree of packages. Returns the expected number of each verdict."""
     number = 0
     for source, _, count in PACKAGES:
         for _ in range(count):
@@ -129,8 +129,8 @@ def cut_journal_problems(shell):
     process = shell.start("./check-batch 000000")
     _, errors = process.communicate()
     if process.returncode == 0 or "000000" in shell.journals():
-        return ["a job must fail and keep no journal that was cut off, "
-                f"but it ends with {process.returncode}: {errors}"]
+        return ["if its journal was cut off, a job must fail and must not rename the journal, "
+                f"but the job ends with {process.returncode}: {errors}"]
     return []
 
 
@@ -146,7 +146,8 @@ def check(directory, simulator, expected):
         problems += found
     again = [name for name, when in first.items()
              if (directory / "journals" / name).stat().st_mtime_ns != when]
-    if len(again) > 2:  # two jobs run at once; both may have ended unrecorded
+    # Two jobs run at once. Both can end just before the kill, so that joblog lacks their lines.
+    if len(again) > 2:
         problems.append(f"these lists were done, and were run again: {again}")
     counts = [output for command, output in printed.items() if "group_by" in command]
     if [json.loads(text) for text in counts] != [expected]:

@@ -1,7 +1,6 @@
 #!/usr/bin/env python3
-"""Runs scripts/test-results on files as ctest writes them: with passed, skipped, disabled and
-failed tests, with a test that timed out, with a test that could not be started, and without
-tests."""
+"""Runs scripts/test-results on files in the form of ctest's JUnit files. The tests in these files
+passed, failed, timed out, were skipped or disabled, or could not be started. One file has no tests."""
 
 import subprocess
 import sys

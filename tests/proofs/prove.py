@@ -64,9 +64,8 @@ def half_digit_is_quotient_and_remainder():
     function = load("crypto/mpi.cpp", "half_digit")
     given = [z3.UGE(d.term, 1 << 31), z3.ULT(rest.term, d.term), z3.ULE(half.term, HALF)]
     high, low = d >> 16, d & HALF
-    # rest = estimate * high + left; `taken` and `to_take` are the products of the estimate with the
-    # halves of d. `rest` is below (2^16 + 2) * high, so the estimate is below 2^16 + 2, and
-    # `to_take` fits in a limb.
+    # `taken` is estimate * high, and `to_take` is estimate * low. `rest` is taken + left. `rest` is
+    # below (2^16 + 2) * high, so the estimate is below 2^16 + 2, and `to_take` fits in a limb.
     estimate, left, taken, to_take = word("estimate"), word("left"), word("taken"), word("to_take")
     always(given, z3.UGT(wide(high) * (HALF + 3), wide(rest)))
     given += [z3.ULE(estimate.term, HALF + 2), z3.ULT(left.term, high.term),
@@ -87,7 +86,7 @@ def half_digit_is_quotient_and_remainder():
         return function(place, half, d), place[0]
 
     Word.quotient, Word.product = quotient, product
-    # The dividend is rest * 2^16 + next. The dividend minus estimate * d is left * 2^16 + next -
+    # The dividend is rest * 2^16 + half. The dividend minus estimate * d is left * 2^16 + half -
     # to_take.
     difference = (wide(left) << 16) + wide(half) - wide(to_take)
     for holds, (digit, remainder) in Runs(run, given):
@@ -95,7 +94,8 @@ def half_digit_is_quotient_and_remainder():
         given_back = z3.If(less == 0, 0, z3.If(less == 1, wide(d), 2 * wide(d)))
         always(holds, z3.ULE(less, 2), z3.ULT(remainder.term, d.term),
                wide(remainder) == difference + given_back)
-    # Therefore the digit is the quotient, and it fits in half a limb.
+    # The remainder is below d, so the digit is the quotient. The dividend is below d * 2^16, so the
+    # digit fits in half a limb.
     always(given, z3.ULT((wide(rest) << 16) + wide(half), wide(d) << 16))
 
 
@@ -108,7 +108,8 @@ def plain_text_is_eight_bytes_above_the_line_ends():
 
 
 class Power:
-    """A power of a number. Only its exponent is kept, because a product adds the exponents."""
+    """A power of some base. Only the exponent is kept. A product of two powers has the sum of their
+    exponents."""
 
     def __init__(self, exponent):
         self.exponent = exponent
@@ -140,10 +141,10 @@ class Montgomery:
 
 
 def windows_make_up_the_exponent():
-    """After every window, and after every zero between windows, the loop of `raise` is in its
-    initial state again. The exponents that are checked here contain each pair of windows, with and
-    without a zero between them. They therefore stand for all exponents. In the shifted exponents,
-    some windows cross the border between two limbs."""
+    """After every window, and after every zero between windows, `nbits` and `wbits` of `raise` are
+    0 again. The exponents that are checked here contain each pair of windows, with and without a
+    zero between the two windows. These exponents therefore stand for all exponents. In the shifted
+    exponents, some windows cross the border between two limbs."""
     function = load("crypto/mpi_pow_mod.cpp", "raise", kMpiLimbBits=LIMB_BITS,
                     mpi_msb=lambda number: number.value.bit_length())
     for w in (1, 3, 4, 5, 6):

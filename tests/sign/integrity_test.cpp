@@ -18,8 +18,8 @@ using Events = std::vector<std::string>;
 constexpr char kSelf[] = "integrity /proc/self/integrity/value";
 constexpr uint8_t kPayload[] = {3, 0, 0xaa, 0xbb, 0xcc};  // length 3, then 3 bytes
 
-// The codes are part of the interface: 0 for success, and 65536 for every failure. The cause and
-// the kernel's own error number do not matter.
+// The result codes are part of the interface: 0 for success, and 65536 for every failure. The code
+// is 65536 for every cause of a failure, and for every error number of the kernel.
 TEST(VeltResultCode, EveryFailureIs65536) {
   constexpr uint32_t kFailure = 65536;
   Phone phone;
@@ -27,7 +27,7 @@ TEST(VeltResultCode, EveryFailureIs65536) {
   EXPECT_EQ(VeltSignFd(7, nullptr), kFailure);
   EXPECT_EQ(VeltTaskReadIntegrity(0, 0, nullptr), kFailure);
   EXPECT_EQ(VeltTaskReadIntegrity(-1, 0, &value), kFailure);
-  // Only 0 is success. Numbers above and below it are failures.
+  // Only the kernel's result 0 is success. Results above and below 0 are failures.
   for (const int result : {1, 2, -2, 65536, INT_MAX, INT_MIN}) {
     phone.kernel_result = result;
     EXPECT_EQ(VeltSignFd(7, kPayload), kFailure) << result;

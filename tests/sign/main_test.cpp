@@ -1,6 +1,5 @@
-// Tests what main() does apart from its three steps, which sign the libraries, sign the file and
-// register the key. The tool runs without the simulated phone. The tool's log goes to standard
-// error.
+// Tests main() itself, not the three steps that it calls (VeltSignJni, VeltSign and ZuSign). The
+// tool runs without the simulated phone. The tool's log goes to standard error.
 #include <gtest/gtest.h>
 #include <sys/stat.h>
 

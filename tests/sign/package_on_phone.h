@@ -1,5 +1,5 @@
-// A package on disk with its libraries beside it. Inside the test program, a Phone
-// (support/phone.h) takes the place of the kernel and of libzu.
+// A package on disk. A test can add libraries beside the package. Inside the test program, a Phone
+// (support/phone.h) replaces the kernel's integrity feature and libzu.
 #pragma once
 
 #include <fcntl.h>
@@ -21,8 +21,9 @@ using Events = std::vector<std::string>;
 
 inline constexpr char kSelf[] = "integrity /proc/self/integrity/value";
 
-// The payload of every package signed with the key "rsa-2048": the length 32, then the SHA-256
-// digest of the key's modulus, computed by libcrypto.
+// The payload of every package signed with the key "rsa-2048", in hexadecimal: the length 32 as 16
+// bits in little-endian order, then the SHA-256 digest of the key's modulus. libcrypto computes the
+// digest.
 inline std::string PackagePayload() {
   const Bytes modulus = ModulusOf("rsa-2048");
   uint8_t digest[SHA256_DIGEST_LENGTH];
@@ -41,7 +42,8 @@ inline LogRecord Starts(int fd) {
 }
 inline LogRecord Finished() { return Info("VeltSignJni finished: 0.\n"); }
 
-// A package in its own directory, open for reading. `log` has only the messages after the opening.
+// A package in a temporary directory, open for reading. `log` has only the messages that the tool
+// logs after it has opened the package.
 class PackageOnPhone {
  public:
   explicit PackageOnPhone(const Package& package, const std::string& directory = "")
@@ -53,7 +55,7 @@ class PackageOnPhone {
   }
   ~PackageOnPhone() { close(fd_); }
 
-  // Writes the item's bytes to disk, at `path` in the package's directory.
+  // Writes the item's bytes to disk, at `path` in the temporary directory.
   void Install(const std::string& path, const ZipItem& item) const { temp_.Write(path, item.data); }
   std::string Path(const std::string& path) const { return temp_ / path; }
 

@@ -1,5 +1,5 @@
-// Tests which files the tool asks the kernel to sign, their payloads, and the log. Most packages
-// are real files with their libraries beside them. A Phone takes the place of the kernel.
+// Tests which files the tool asks the kernel to sign, their payloads, and the log. PackageOnPhone
+// writes a package to disk, and its libraries beside it. A Phone takes the place of the kernel.
 #include "sign/signing.h"
 
 #include <fcntl.h>
@@ -157,7 +157,7 @@ TEST(VeltSignJni, DescriptorOfALibraryIsClosed) {
   EXPECT_EQ(fcntl(file.fd() + 1, F_GETFD), -1);
 }
 
-// A library gets descriptor 0 if the process was started without standard input.
+// A library gets descriptor 0 if standard input was closed after the package was opened.
 TEST(VeltSignJni, LibraryMayHaveDescriptor0) {
   const ZipItem library = Library("lib/arm64-v8a/libfoo.so");
   PackageOnPhone file(MakePackage(WithLibraries({library})));

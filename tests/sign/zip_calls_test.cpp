@@ -1,6 +1,7 @@
 // Tests how the tool calls the zip library. The tool's results do not show these calls, so the
-// linker redirects them to the functions below, which then call the library. CMakeLists.txt has the
-// mangled names of the library's functions.
+// linker redirects them to the Wrap functions below. The Wrap functions record the calls and call
+// the library. If the test sets no_iteration, WrapStartIteration fails without a call of the
+// library. tests/sign/CMakeLists.txt has the mangled names of the library's functions.
 #include <gtest/gtest.h>
 
 #include <algorithm>
@@ -19,10 +20,10 @@ namespace {
 constexpr int32_t kInvalidHandle = -4;  // the zip library's code
 
 struct ZipCalls {
-  std::vector<bool> ownership;       // for each archive: true if it owns its descriptor
-  std::vector<std::string> filters;  // "PREFIX SUFFIX" of each started iteration
-  std::vector<void*> archives;       // the archive of each iteration
-  std::vector<void*> open_cookies;   // of iterations that have not ended
+  std::vector<bool> ownership;       // for each opening: true if the archive owns its descriptor
+  std::vector<std::string> filters;  // "PREFIX SUFFIX" of each StartIteration call
+  std::vector<void*> archives;       // the archive of each StartIteration call
+  std::vector<void*> open_cookies;   // the cookies of iterations that have not ended
   bool no_iteration = false;         // true: every start of an iteration fails
 } calls;
 

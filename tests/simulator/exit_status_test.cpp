@@ -1,5 +1,6 @@
 // The exit status of apktoolkit-sim, and the messages that belong to it. In most tests, the probe
-// (phone/probe.cpp) takes the place of the tool, and executes the commands that the test lists.
+// (tests/simulator/phone/probe.cpp) takes the place of the tool, and executes the commands that the
+// test lists.
 #include <gtest/gtest.h>
 #include <sys/stat.h>
 #include <unistd.h>
@@ -208,8 +209,8 @@ TEST(ExitStatus, IsThreeWhenThePageIsAPipeThatNobodyReads) {
   EXPECT_EQ(read.output.substr(read.output.size() - 8), "</html>\n");
 }
 
-// The fault is in the file system and not in the package, so the run reports nothing about the
-// package.
+// The fault is in the file system and not in the package, so the package is not refused. Its
+// verdict is NOT SIMULATED.
 TEST(ExitStatus, IsThreeWhenLibrariesCannotBeWritten) {
   const TempDir directory;
   const std::string file = directory / "base.apk";
@@ -276,8 +277,8 @@ TEST(ExitStatus, IsTwoWhenThePageWouldReplaceAFile) {
 TEST(ExitStatus, IsTwoWhenATrustedFileOrTheToolWouldBeReplaced) {
   const TempDir directory;
   const Probe probe({"sign 3 0000"});
-  // Each file begins like the output that would replace it. It is protected only because the run
-  // uses it.
+  // Each file begins like an earlier output of apktoolkit-sim, which a new output may replace. The
+  // run refuses to replace these files only because they are its inputs.
   const std::string journal = directory.Write("journal", ToBytes("{\"event\":\"journal\"}\n"));
   const std::string page =
       directory.Write("page", ToBytes("<!DOCTYPE html>\n<!-- A page of apktoolkit-sim -->\n"));
@@ -340,8 +341,8 @@ TEST(ExitStatus, IsTwoWhenTwoOutputsAreOneFile) {
   }
 }
 
-// In one file, an output and the printed lines would overwrite each other. In a pipe, they follow
-// each other.
+// If an output and a standard stream were the same file, their texts would overwrite each other. A
+// pipe keeps both texts, so the run accepts a pipe.
 TEST(ExitStatus, IsTwoWhenAnOutputIsAlsoAStandardStream) {
   const Probe probe({"sign 3 0000"});
   const auto told = [&probe](const std::string& rest) {
@@ -358,7 +359,7 @@ TEST(ExitStatus, IsTwoWhenAnOutputIsAlsoAStandardStream) {
   EXPECT_EQ(told("--journal /dev/stdout | cat").status, 0);
 }
 
-// If one output cannot be opened, the others must not look like those of a good run.
+// If one output cannot be opened, the other outputs must not look like the outputs of a good run.
 TEST(ExitStatus, IsThreeAndReportsShowItWhenAnOutputCannotBeOpened) {
   const Probe probe({"sign 3 0000"});
   const std::string directory = probe.directory().path();
@@ -378,8 +379,8 @@ TEST(ExitStatus, IsThreeAndReportsShowItWhenAnOutputCannotBeOpened) {
   EXPECT_EQ(ContentOf(journal), "{\"event\":\"journal\",\"version\":1}\n");
 }
 
-// There is one message for the journal, and not one for each of the three files. The SARIF log also
-// says that the run failed.
+// Three files are given, but the simulator prints only one message about the journal. The SARIF log
+// has one notification, and reports that the run failed.
 TEST(ExitStatus, IsThreeWithOneMessageWhenTheDiskIsFull) {
   const Probe probe({"sign 3 0000"});
   const std::string sarif = probe.directory() / "s.sarif";

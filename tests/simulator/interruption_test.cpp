@@ -12,7 +12,7 @@
 namespace {
 
 // Runs a command in its own process group. As soon as a file that matches `pattern` is not empty,
-// sends `signal` to the command, or to the whole group as the keyboard does. `ended_by` is the
+// sends `signal` to the command, or to the whole group as Ctrl+C does. `ended_by` is the
 // signal that ended the command (0 or less if none did). `seconds` is the time from the signal to
 // the end of the command.
 struct Interrupted {
@@ -67,8 +67,8 @@ TEST(Interruption, EndsTheToolAndTheSimulatorByTheSignal) {
   }
 }
 
-// The keyboard signals the simulator's whole process group. The tool is in a group of its own, and
-// the simulator ends it. This end is not a refusal of the file.
+// Ctrl+C sends SIGINT to the simulator's whole process group. The tool runs in another process
+// group, so the simulator ends the tool. The report must not say that the file was refused.
 TEST(Interruption, SignalToTheProcessGroupIsNotARefusal) {
   const Probe slow({"sign 3 0000", "pid", "sleep 60"});
   const std::string sarif = slow.directory() / "log.sarif";
@@ -82,8 +82,9 @@ TEST(Interruption, SignalToTheProcessGroupIsNotARefusal) {
   EXPECT_EQ(log["runs"][0]["invocations"][0]["executionSuccessful"], false);
 }
 
-// When the signal comes, the tool has already ended. The installer's verifier (here the script
-// "java") is still busy. Without its answer there is no result.
+// The script "java" replaces the installer's verifier, and never answers. The tool normally ends
+// during the script's first sleep, before the signal comes. Without an answer of the verifier, the
+// file has no result.
 TEST(Interruption, EndsTheInstallersVerifierWithoutAResult) {
   const TempDir directory;
   const std::string file = directory / "base.apk", pid = directory / "pid";
@@ -153,8 +154,8 @@ TEST(Page, ShowsWhatAnInterruptedRunHasDone) {
   EXPECT_NE(text.find("</html>\n"), std::string::npos);
 }
 
-// Each file has its test case. The interrupted file has an error. The last two files were never
-// begun, and also have an error.
+// Each file has a test case in the JUnit report. The JUnit report and the SARIF log have an error
+// for the interrupted file, and for each of the last two files, which were never begun.
 TEST(Reports, AreCompleteAndHaveErrorsAfterAnInterruption) {
   const Probe good({"sign 3 0000"});
   const Probe slow({"sign 3 0000", "pid", "sleep 60"});

@@ -1,5 +1,5 @@
-// Runs apktoolkit-sim. The simulated tool is apktoolkit, or the probe (simulator/phone/probe.cpp),
-// which executes a test's commands.
+// Runs apktoolkit-sim. The simulated tool is apktoolkit, or the probe
+// (tests/simulator/phone/probe.cpp), which executes a test's commands.
 #pragma once
 
 #include <algorithm>
@@ -8,8 +8,8 @@
 #include "support/process.h"
 #include "support/simulation.h"
 
-// Runs apktoolkit-sim in a UTF-8 locale. The phone's installer is not asked, and the libraries of
-// packages are not extracted.
+// Runs apktoolkit-sim in a UTF-8 locale. By default, the phone's installer is not asked, and the
+// libraries of packages are not extracted. Options in `words` can change these defaults.
 inline ProcessResult Told(const Lines& words) {
   Lines command = {"env", "LC_ALL=C.UTF-8", SimulatorPath(), "--installer=off", "--install=no"};
   command.insert(command.end(), words.begin(), words.end());
@@ -29,8 +29,8 @@ inline Lines FirstLines(const ProcessResult& result, size_t count) {
   return lines;
 }
 
-// Runs `script` in the shell. In the script, "$@" is the simulator with the probe as its tool, and
-// then `words`.
+// Runs `script` in the shell. In the script, "$@" is the command that runs the simulator with the
+// probe as the tool, followed by `words`.
 inline ProcessResult InShell(const std::string& script, const Lines& words) {
   Lines command = {"bash", "-c", script, "bash", SimulatorPath(), "--tool", PROBE_PATH};
   command.insert(command.end(), words.begin(), words.end());

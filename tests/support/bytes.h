@@ -1,4 +1,4 @@
-// Bytes, and ways to write them in tests.
+// The type Bytes, and conversions of bytes from and to text, for tests.
 #pragma once
 
 #include <cstddef>

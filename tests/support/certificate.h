@@ -1,8 +1,8 @@
 // Builds X.509 certificates (RFC 5280 §4.1), good and malformed.
 //
-// Each field of type Bytes has the DER for its place, including the identifier and length octets. A
-// test changes a certificate by assigning to a field. If an optional field has no value, Build
-// computes it from the other members.
+// Build writes the Bytes in each field unchanged, so they include the identifier and length octets.
+// A test changes a certificate by assigning to a field. If a std::optional field has no value,
+// Build computes that field from the other members.
 #pragma once
 
 #include <optional>
@@ -12,14 +12,14 @@
 
 #include "support/der.h"
 
-// The digests that a signature can be made over, and their object identifiers.
+// The digest algorithms that a signature can use.
 enum class Digest { kMd5, kSha1, kSha256 };
 
 std::string DigestOid(Digest digest);        // of the digest itself
 std::string RsaSignatureOid(Digest digest);  // of RSA PKCS#1 v1.5 with this digest
 Bytes DigestOf(Digest digest, const Bytes& data);
-// The PKCS#1 v1.5 signature by the RSA test key `key` (support/keys.h) over `data`; for an EC key,
-// the ECDSA signature.
+// The signature over `data` by the test key `key` (support/keys.h): PKCS#1 v1.5 with an RSA key,
+// ECDSA with an EC key.
 Bytes SignWith(const std::string& key, Digest digest, const Bytes& data);
 // The encoded message of the data (RFC 8017 §9.2) in `size` bytes. The padding fills the remaining
 // bytes and can be empty. Returns no bytes if the DigestInfo does not fit.
@@ -31,7 +31,7 @@ Bytes PublicKeyInfo(const std::string& key);
 // A SubjectPublicKeyInfo for RSA around any contents, such as an RSAPublicKey.
 Bytes PublicKeyInfoAround(const Bytes& public_key);
 
-// A Name with one attribute for each pair of object identifier and text, as UTF8Strings.
+// A Name. Each pair is an attribute: its object identifier, and its text as a UTF8String.
 Bytes Name(const std::vector<std::pair<std::string, std::string>>& attributes);
 // An Extension. The critical flag is written only if it is TRUE.
 Bytes Extension(const std::string& oid, const Bytes& value, bool critical = false);
@@ -53,7 +53,7 @@ struct Certificate {
   std::optional<Bytes> public_key_info;
   Bytes issuer_unique_id;         // [1], or empty
   Bytes subject_unique_id;        // [2], or empty
-  std::vector<Bytes> extensions;  // each an Extension; none: no [3]
+  std::vector<Bytes> extensions;  // each an Extension; empty: no [3]
   Bytes tbs_tail;                 // anything after the extensions
 
   std::optional<Bytes> tbs;  // in place of all fields of the tbsCertificate

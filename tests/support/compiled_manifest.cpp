@@ -50,7 +50,7 @@ void PutString8(Bytes& out, const std::string& text) {
   out.push_back(0);
 }
 
-// A string in a UTF-16 pool. It starts with its length: one unit, or two units, the first of which
+// A string in a UTF-16 pool. It starts with its length: one 16-bit unit, or two, the first of which
 // has its highest bit set.
 void PutString16(Bytes& out, const std::string& text) {
   const std::u16string units = ToUtf16(text);

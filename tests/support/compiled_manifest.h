@@ -1,5 +1,5 @@
 // Writes Android's compiled XML, good and bad: a string pool, then the nodes in the order of the
-// calls. Nothing checks that elements nest.
+// calls that add nodes. CompiledXml does not check that elements nest.
 #pragma once
 
 #include <cstdint>
@@ -13,10 +13,10 @@
 struct XmlAttribute {
   std::string name;
   uint8_t type;            // of the typed value (Res_value)
-  std::string text;        // the raw value, and the typed value if its type is string
-  bool has_raw = false;    // whether it has a raw value
-  uint32_t data = 0;       // the typed value, unless it is a string
-  std::string name_space;  // its URI; empty for none
+  std::string text;        // the raw value; also the typed value if `type` is string
+  bool has_raw = false;    // whether the attribute has a raw value
+  uint32_t data = 0;       // the typed value, unless `type` is string
+  std::string name_space;  // the URI of the namespace; empty: no namespace
   bool has_name = true;    // whether the name is in the string pool
 };
 
@@ -51,7 +51,7 @@ class CompiledXml {
   CompiledXml& BadNode();
   // A start tag whose name is not in the string pool.
   CompiledXml& StartWithoutName();
-  // A start of a namespace whose URI is not in the string pool.
+  // A start of a namespace. The prefix and the URI of the namespace are not in the string pool.
   CompiledXml& StartNamespaceWithoutUri();
 
   Bytes Build() const;

@@ -10,7 +10,8 @@
 
 namespace der {
 
-// Identifier octets of the universal types that the tests need, with the constructed bit.
+// Identifier octets of the universal types that the tests need. Those of SEQUENCE and SET include
+// the constructed bit.
 enum Identifier : uint8_t {
   kBoolean = 0x01,
   kInteger = 0x02,
@@ -35,12 +36,12 @@ Bytes Sequence(const std::vector<Bytes>& elements);
 Bytes Set(const std::vector<Bytes>& elements);
 // A constructed element with the context-specific tag [number].
 Bytes Context(uint8_t number, const Bytes& contents);
-// The same element, but primitive, as for an IMPLICIT string.
+// A primitive element with the context-specific tag [number], such as an IMPLICIT string.
 Bytes ContextPrimitive(uint8_t number, const Bytes& contents);
 
 Bytes Boolean(uint8_t value);
 Bytes Integer(uint64_t value);
-// An INTEGER with exactly these bytes.
+// An INTEGER with exactly these contents octets.
 Bytes Integer(const Bytes& contents);
 Bytes BitString(const Bytes& contents, uint8_t unused_bits = 0);
 Bytes OctetString(const Bytes& contents);

@@ -1,7 +1,7 @@
 // Tests describe the events of one run of the tool on a phone as a timeline: a text with one line
 // for each event, in order. Timelines are joined with `+`, and a difference is shown line by line.
-// Each function up to Exit makes the line of one event, with every member of the journal's event
-// (docs/journal.md).
+// Each function from Log to Exit returns the line of one event. The line has every member that the
+// event has in the journal (docs/journal.md).
 #pragma once
 
 #include <initializer_list>
@@ -18,7 +18,8 @@ std::string IntegrityMissing();
 // The tool asked the kernel to sign the open file `fd`. `refusal` is the errno of the kernel's
 // refusal; 0: the kernel signed.
 std::string Sign(int fd, const std::string& path, const Bytes& payload, int refusal = 0);
-// The tool asked the kernel to verify the open file `fd`. `refusal` 0: the kernel trusts it.
+// The tool asked the kernel to verify the open file `fd`. `refusal` is the errno of the kernel's
+// refusal; 0: the kernel trusts the file.
 std::string Verify(int fd, const std::string& path, int refusal = 0);
 // The tool asked libzu to register `data` under `name`.
 std::string Register(int fd, const std::string& path, const std::string& name, const Bytes& data,
@@ -38,9 +39,9 @@ Bytes PackagePayload(const std::string& key = "rsa-2048");
 // The events of VeltSignJni, the step that signs the libraries: its first log record, the events of
 // each library, and its last log record.
 std::string LibraryStep(std::initializer_list<std::string> libraries = {});
-// A library that matched the manifest and was signed.
+// The events of a library that matched the manifest and was signed.
 std::string SignedLibrary(const std::string& path, const Bytes& payload = PackagePayload());
 // The events of VeltSign, the step that signs the package file, for a good package.
 std::string PackageStep(const std::string& path, const Bytes& payload = PackagePayload());
-// The events of both steps for a package that the tool refused before the first step.
+// The events of VeltSignJni and VeltSign for a package that the tool refused before VeltSignJni.
 std::string NothingSigned(const std::string& path);

@@ -7,8 +7,8 @@
 
 #include <cstddef>
 
-// While an object of this class exists, one call of malloc fails, and the blocks of the other calls
-// are watched. Only one FailingMalloc may exist at a time.
+// While an object of this class exists, it makes at most one call of malloc fail, and watches the
+// blocks of the other calls. Only one FailingMalloc may exist at a time.
 class FailingMalloc {
  public:
   // Makes call number `failing_call` fail, counted from 1; 0 lets all succeed.
@@ -28,7 +28,7 @@ class FailingMalloc {
   // The number of freed blocks that still had bytes other than zero.
   int freed_unwiped() const { return freed_unwiped_; }
 
-  // For the wrapped functions.
+  // Called only by __wrap_malloc and __wrap_free.
   void* Allocate(size_t size);
   void Release(void* block);
 

@@ -19,7 +19,8 @@ namespace {
   abort();
 }
 
-// The directory for temporary files: TMPDIR if it is set, else /tmp, or /data/local/tmp on a phone.
+// The directory for temporary files: TMPDIR if it is set, else /tmp if /tmp is writable, else
+// /data/local/tmp, which phones have.
 std::string TemporaryDirectory() {
   if (const char* const named = getenv("TMPDIR"); named != nullptr) return named;
   return access("/tmp", W_OK) == 0 ? "/tmp" : "/data/local/tmp";

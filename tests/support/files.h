@@ -10,7 +10,8 @@
 // A new empty directory.
 class TempDir {
  public:
-  // Makes the directory below the directory for temporary files, or below `parent`.
+  // Makes the directory below `parent`, or below the directory for temporary files if `parent` is
+  // empty.
   explicit TempDir(const std::string& parent = {});
   ~TempDir();
   TempDir(const TempDir&) = delete;
@@ -56,7 +57,7 @@ class MemoryFile {
   MemoryFile& operator=(const MemoryFile&) = delete;
 
   int fd() const { return fd_; }
-  // The path that its descriptor resolves to.
+  // The path that the kernel reports for the descriptor: "/memfd:NAME (deleted)".
   std::string path() const { return path_; }
 
  private:

@@ -1,5 +1,5 @@
-// Bytes at the end of readable memory. A read after the end crashes in every build, with or without
-// a sanitizer.
+// Bytes that are followed by a page that cannot be read. A read from this page crashes in every
+// build, with or without a sanitizer.
 #pragma once
 
 #include <sys/mman.h>

@@ -27,7 +27,7 @@ class JarText {
   JarText& Digests(const std::vector<std::string>& attributes, const Bytes& data,
                    const std::string& suffix = "");
   JarText& EndSection();
-  // Adds a whole section: "Name", the digests, and its end.
+  // Adds a whole section: "Name", the digests, and the empty line at the section's end.
   JarText& Section(const std::string& name, const std::vector<std::string>& attributes,
                    const Bytes& data);
 

@@ -1,6 +1,6 @@
-// A write lease on a file (fcntl, F_SETLEASE). Its holder gives the lease up at least 100 ms after
-// a process, possibly this one, tries to open the file. Until then, the open waits, or fails with
-// EWOULDBLOCK if it has O_NONBLOCK.
+// A write lease on a file (fcntl, F_SETLEASE). A thread of the Lease gives the lease up at least
+// 100 ms after any process tries to open the file, this process included. Until then, the call of
+// open() waits, or fails with EWOULDBLOCK if its flags include O_NONBLOCK.
 #pragma once
 
 #include <fcntl.h>
@@ -33,7 +33,7 @@ class Lease {
  private:
   void GiveUpWhenAsked() {
     while (!is_over_ && fcntl(fd_, F_GETLEASE) == F_WRLCK) usleep(1000);
-    usleep(100000);  // the holder finishes its work
+    usleep(100000);  // as if the holder had to finish its work first
     was_given_up_ = !is_over_;
     fcntl(fd_, F_SETLEASE, F_UNLCK);
   }

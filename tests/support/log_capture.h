@@ -1,8 +1,8 @@
 // Catches the Android log of the code under test.
 //
-// The test program defines __android_log_print itself. Records that the tool or a platform library
-// writes with this function therefore come here. They do not go to standard error. A LogCapture
-// keeps the records with the tool's tag, in order, while it lives.
+// The test program defines __android_log_print itself. Records that the tool's code or a platform
+// library writes with this function therefore do not go to standard error. A LogCapture keeps the
+// records with the tool's tag, in order, while the LogCapture lives.
 #pragma once
 
 #include <string>

@@ -13,10 +13,10 @@ namespace {
 
 constexpr size_t kRoom = 1 << 20;
 
-// The end of the kRoom bytes that MakeMemory maps. The page after them cannot be accessed. The
-// block that PutNextBlockAtMemoryEnd requests is in these kRoom bytes, at their end.
+// The end of the kRoom bytes that MakeMemory maps. The page after these bytes cannot be accessed.
+// The block that PutNextBlockAtMemoryEnd requests ends at memory_end or up to 3 bytes before.
 uint8_t* memory_end = nullptr;
-// operator new puts the next block of this size at memory_end; 0: no block.
+// operator new puts the next block of this size, in bytes, before memory_end; 0: none is requested.
 size_t size_at_end = 0;
 
 void MakeMemory() {

@@ -1,14 +1,14 @@
-// Puts a block at the end of accessible memory, for code that no sanitizer checks. A read after the
-// end of the memory crashes the program.
+// Puts a block at the end of a memory area, for code that no sanitizer checks. A page that cannot
+// be read follows the area. A read from this page crashes the program.
 //
-// A program that links this file (target `memory_end`) has its operator new replaced.
+// In a program that links the target `memory_end`, operator new and operator delete are replaced.
 #pragma once
 
 #include <cstddef>
 
-// The next call of operator new for exactly `size` bytes (at most 1 MiB) returns a block at the end
-// of memory. Up to 3 bytes follow the block, because it starts at a multiple of 4. Only one such
-// block may be in use at a time.
+// The next call of operator new for exactly `size` bytes (1 byte to 1 MiB) returns a block at the
+// end of the area. The block starts at a multiple of 4, so up to 3 unused bytes can follow it in
+// the area. Only one block of the area may be in use at a time.
 void PutNextBlockAtMemoryEnd(size_t size);
-// True if the block was put at the end of memory. If not, forgets the request.
+// True if the requested block was put at the end of the area. If not, forgets the request.
 bool WasPutAtMemoryEnd();

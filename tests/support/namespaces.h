@@ -4,9 +4,9 @@
 #include <string>
 #include <vector>
 
-// True if user and mount namespaces can be made. The kernel can forbid them, and so can the
-// container in which the test runs. A test that needs namespaces is then skipped with the reason
-// kNoNamespaces.
+// True if user and mount namespaces can be made. The kernel can forbid namespaces. The container in
+// which the test runs can forbid them as well. If the result is false, a test that needs namespaces
+// is skipped with the reason kNoNamespaces.
 bool CanMakeNamespaces();
 inline constexpr char kNoNamespaces[] = "the kernel, or this container, allows no user namespaces";
 

@@ -1,5 +1,6 @@
-// Operands for the tests of the large integers in crypto/mpi.h: made of given limbs or drawn at
-// random. Also converts between these integers and GMP's numbers.
+// Operands for the tests of the integers in crypto/mpi.h: made of given limbs or drawn at random.
+// Other functions convert these integers, or their limbs, to GMP's numbers. LimbsOf() converts a
+// GMP number to limbs.
 #pragma once
 
 #include <gmpxx.h>
@@ -45,8 +46,8 @@ inline Limbs LimbsOf(const mpz_class& z) {
 
 inline mpz_class PowerOfTwo(unsigned long exponent) { return mpz_class(1) << exponent; }
 
-// Operands that are random, or made of limbs that provoke carries, borrows and wrong estimates of a
-// quotient.
+// Makes operands. Their limbs are random, or have values that provoke carries, borrows and wrong
+// estimates of a quotient.
 class Operands {
  public:
   uint32_t Below(uint32_t bound) { return static_cast<uint32_t>(random_() % bound); }
@@ -59,7 +60,8 @@ class Operands {
     return Below(2) == 0 ? static_cast<uint32_t>(random_()) : kEdges[Below(std::size(kEdges))];
   }
 
-  // 0 to `max` limbs: random, mixed, or all equal; sometimes with zero limbs at the top.
+  // 0 to `max` limbs. All are random, or all are from Limb(), or all are equal. Sometimes the most
+  // significant limbs are then set to zero.
   Limbs Magnitude(uint32_t max) {
     Limbs limbs(Below(max + 1));
     const uint32_t kind = Below(3);
@@ -91,8 +93,9 @@ struct Aliased {
   }
 };
 
-// Calls `operation`, which returns a result code, once for each of its allocations, and makes that
-// allocation fail. In the last call, no allocation fails.
+// Calls `operation` repeatedly. In call n, allocation n fails, and `operation` must return
+// kMpiNoMemory. In the last call, no allocation fails, and `operation` must return 0. No call may
+// leak a block, or free a block that is not wiped.
 template <typename Operation>
 void ExpectNoMemoryAtEveryAllocation(const Operation& operation) {
   for (int call = 1;; ++call) {

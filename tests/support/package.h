@@ -1,9 +1,9 @@
 // Makes whole packages and JARs: entries, the manifest that lists them, the signature file and the
 // signature block.
 //
-// A package is made in steps, so that a test can change it between them. `MakePackage` signs;
-// `Package` has the entries, which a test can change, remove or add; `Build` or `WriteTo` makes the
-// archive.
+// A package is made in steps, so that a test can change the package between two steps.
+// `MakePackage` signs; `Package` has the entries, which a test can change, remove or add; `Build`
+// or `WriteTo` makes the archive.
 #pragma once
 
 #include <functional>
@@ -23,10 +23,11 @@ inline constexpr char kAndroidManifestName[] = "AndroidManifest.xml";
 struct PackageOptions {
   std::string package_name = "com.example.app";
   bool secure_storage = false;
-  // Replaces the compiled manifest that is made from the two fields above. If set to no bytes, the
-  // archive has no such entry (a JAR).
+  // Replaces the compiled manifest that is made from the two fields above. If this member is an
+  // empty Bytes, the archive has no Android manifest, and is a plain JAR.
   std::optional<Bytes> android_manifest;
-  // The entries other than the Android manifest, in the order of the archive.
+  // The entries other than the Android manifest and the signature-related files in META-INF, in the
+  // order of the archive.
   std::vector<ZipItem> entries = {{"classes.dex", ToBytes("dex\n035")},
                                   {"lib/arm64-v8a/libfoo.so", ToBytes("\177ELF foo")}};
 
@@ -34,7 +35,7 @@ struct PackageOptions {
   // attributes in the signature file get the suffix "-Manifest".
   std::vector<std::string> digests = {"SHA-256-Digest"};
   std::vector<std::string> signature_file_digests = {"SHA-256-Digest"};
-  // The names of the signature file and of its block, without ".SF" and ".RSA".
+  // The signature file is `base_name` + ".SF". Its block is `base_name` + `block_extension`.
   std::string base_name = "META-INF/CERT";
   std::string block_extension = ".RSA";
 
@@ -70,5 +71,5 @@ PackageOptions WithoutDex();
 // Options for a package whose META-INF/MANIFEST.MF is this text.
 PackageOptions WithManifest(const std::string& text);
 
-// The big-endian modulus of the RSA test key: the manufacturer key of packages that it signs.
+// The big-endian modulus of the RSA test key `key`.
 Bytes ModulusOf(const std::string& key);

@@ -1,12 +1,12 @@
 # shellcheck shell=bash
 #
-# Recipes for packages and their signers, with the tools that developers use. scripts/demo,
+# Functions that make packages and signers with the tools that developers use. scripts/demo,
 # tests/journeys/make_golden_packages and tests/threats/make_threat_packages source this file.
 
 recipes_dir=$(cd "$(dirname "${BASH_SOURCE[0]}")" && pwd)
 
-# make_unsigned_package APK: compiles and packs the example package of vault/: its manifest, one
-# class, and one native library for two kinds of processor.
+# make_unsigned_package APK: compiles and packs the example package of vault/: its Android manifest,
+# one class, and one native library for 64-bit Arm and for 32-bit Arm.
 make_unsigned_package() {
   local apk=$1 sources=$recipes_dir/vault work
   work=$(mktemp -d)
@@ -19,8 +19,8 @@ make_unsigned_package() {
   rm -r "$work"
 }
 
-# put_android_manifest APK MANIFEST: makes the package anew, with only this manifest, in compiled
-# form.
+# put_android_manifest APK MANIFEST: compiles the Android manifest MANIFEST, and makes a new package
+# APK that contains only the compiled manifest.
 put_android_manifest() {
   aapt package -f -M "$2" -F "$1" -I /usr/share/android-framework-res/framework-res.apk
 }
@@ -30,8 +30,8 @@ compile_library() {  # TARGET LIBRARY
     "$recipes_dir/vault/vault.c"
 }
 
-# put_entries APK DIRECTORY ENTRY...: packs the named files of the directory, in place of any
-# entries of these names.
+# put_entries APK DIRECTORY ENTRY...: adds the files DIRECTORY/ENTRY to the package. Replaces
+# existing entries of these names.
 put_entries() {
   local apk directory=$2
   apk=$(realpath "$1")
@@ -40,7 +40,7 @@ put_entries() {
   (cd "$directory" && aapt add "$apk" "$@" >/dev/null)
 }
 
-# test_key NAME: the path of a fixed test key.
+# test_key NAME: prints the path of the fixed test key NAME.
 test_key() {
   echo "$recipes_dir/keys/$1.pem"
 }
@@ -56,7 +56,8 @@ make_signer() {
     -out "$out.p12"
 }
 
-# install_libraries APK: puts the package's native libraries beside it, as the installer does.
+# install_libraries APK: extracts the package's native libraries to lib/ beside the package, as the
+# installer does. First deletes an existing lib/.
 install_libraries() {
   local directory work
   directory=$(dirname "$1") work=$(mktemp -d)
@@ -68,12 +69,12 @@ install_libraries() {
   rm -r "$work"
 }
 
-# signer_modulus CERTIFICATE: the modulus of the certificate's key, as hexadecimal digits.
+# signer_modulus CERTIFICATE: prints the modulus of the certificate's key, as hexadecimal digits.
 signer_modulus() {
   openssl x509 -in "$1" -noout -modulus | sed 's/^Modulus=//'
 }
 
-# modulus_digest CERTIFICATE: the SHA-256 digest of the modulus of the certificate's key.
+# modulus_digest CERTIFICATE: prints the SHA-256 digest of the modulus of the certificate's key.
 modulus_digest() {
   signer_modulus "$1" | basenc --base16 -d | openssl dgst -sha256 -r | cut -d' ' -f1
 }

@@ -1,4 +1,4 @@
-// The parts that only a phone has, inside the test program: the kernel's integrity feature and
+// In a test program, replaces the parts that only a phone has: the kernel's integrity feature and
 // libzu.
 //
 // In a program that links phone.cpp, the linker must wrap open, read, fcntl, fopen, usleep,
@@ -21,7 +21,7 @@ struct Phone {
   Phone(const Phone&) = delete;
   Phone& operator=(const Phone&) = delete;
 
-  // By default, a phone has no faults. A test changes the members that it needs.
+  // By default, a phone has no faults. A test sets the members whose defaults it must change.
 
   // The texts of the integrity file, one for each opening. The last text repeats. kNoFile means
   // that this opening fails.
@@ -32,14 +32,14 @@ struct Phone {
   int zu_result = 0;              // the answer of libzu
   int zu_attribute_size = -1;     // of "user.zu", on every file; -1: the real attribute
   std::vector<int> nameless_fds;  // descriptors whose path cannot be resolved
-  // The result of the fcntl call that signs (if sign_errno is 0), and of the one that verifies (if
-  // verify_errno is 0).
+  // The result of each fcntl call that signs or verifies a file, unless sign_errno or verify_errno
+  // makes the call fail.
   int kernel_result = 0;
 
   // Called before the integrity file is opened. The tool opens the integrity file after it has
   // checked a file, and before it asks the kernel to sign this file.
   std::function<void()> before_integrity;
-  // Called before each open(), and after each successful one.
+  // before_open is called before each open(), and after_open after each successful open().
   std::function<void(const char* path, int flags)> before_open;
   std::function<void(const char* path, int fd)> after_open;
   // The errno that an open() fails with; 0: the real system answers.
@@ -48,7 +48,8 @@ struct Phone {
   std::function<void(int fd)> before_read;
   std::function<void(int fd)> after_read;
 
-  // Called after each event with a descriptor, while the descriptor is still open.
+  // Called for each sign, verify and register event, before the call that caused the event returns.
+  // The call's descriptor is therefore still open.
   std::function<void(int fd, const std::string& event)> witness;
 
   // The actions of the code under test, in order: "integrity PATH", "sleep MICROSECONDS", "sign FD
@@ -56,7 +57,6 @@ struct Phone {
   std::vector<std::string> events;
   // The number of calls of fopen, not counting those for integrity files.
   int other_fopens = 0;
-  // The attributes that were read: "FD NAME null SIZE", or "FD NAME buffer SIZE" if a buffer was
-  // passed.
+  // The calls of fgetxattr: "FD NAME null SIZE", or "FD NAME buffer SIZE" if a buffer was passed.
   std::vector<std::string> attributes;
 };

@@ -5,7 +5,7 @@
 #include <vector>
 
 struct ProcessResult {
-  int status;  // the exit status, or 128 plus the signal that ended the program
+  int status;  // the exit status, or 128 plus the number of the signal that ended the program
   std::string output;
   std::string errors;
 };

@@ -65,7 +65,8 @@ struct FixedKey {
   rsa_local context;
 };
 
-// A key of a size that libcrypto does not make: two primes from GMP, exponent 65537.
+// A key for a size that libcrypto does not make: two primes from GMP, exponent 65537. `size` is the
+// length of the modulus in bytes.
 struct SmallKey {
   explicit SmallKey(size_t size) {
     const mpz_class e = 65537;

@@ -21,7 +21,7 @@ Bytes Number64(uint64_t value) {
       {Number32(static_cast<uint32_t>(value)), Number32(static_cast<uint32_t>(value >> 32))});
 }
 
-// The pieces, after their total length.
+// The pieces, after their total length in bytes (4 bytes, little-endian).
 Bytes Prefixed(const std::vector<Bytes>& pieces) {
   const Bytes whole = Concat(pieces);
   return Concat({Number32(static_cast<uint32_t>(whole.size())), whole});

@@ -1,31 +1,31 @@
-// Runs the built programs as processes.
+// Runs the simulator as a process, and gives the paths of the built programs.
 #pragma once
 
 #include <string>
 #include <vector>
 
 struct Simulation {
-  int status;            // of the simulator
-  std::string timeline;  // see expected_timeline.h
+  int status;            // the exit status of the simulator
+  std::string timeline;  // the events of the tool's run, as in expected_timeline.h
 };
 
 // Runs the tool on `file` in the simulated phone that `options` describe. Simulate and FirstLines
-// pass --installer=off and --install=no to the simulator. The options of the test come later and
-// can override these two options. Most tests check the tool's own answers about files in the places
-// where the test put them. The test fails if the simulation itself fails or writes anything to
-// standard error.
+// pass --installer=off and --install=no to the simulator: no installer judges the file, and the
+// file is not copied. The options of the test come later and can override these two options. The
+// test fails if the simulation itself fails or writes anything to standard error.
 Simulation Simulate(const std::string& file, const std::vector<std::string>& options = {});
 
-// The same, with words before the simulator's command and with a working directory.
+// How Simulate and FirstLines start the simulator.
 struct Start {
-  std::vector<std::string> before;  // such as {"unshare", "-m"}
-  std::string directory;
+  std::vector<std::string> before;  // before the simulator's command, such as {"unshare", "-m"}
+  std::string directory;            // the working directory; empty: that of the test
 };
 Simulation Simulate(const std::string& file, const std::vector<std::string>& options,
                     const Start& start);
 
-// Runs the simulator with these words in the directory of `start`, in a UTF-8 locale. Returns the
-// first `count` lines of its output, and its exit status as a last line "-> STATUS".
+// Runs the simulator with the arguments `words` in a UTF-8 locale, started as `start` says. Returns
+// the first `count` lines of the output, and the simulator's exit status as a last line
+// "-> STATUS".
 std::vector<std::string> FirstLines(size_t count, const std::vector<std::string>& words,
                                     const Start& start);
 
@@ -33,7 +33,7 @@ std::vector<std::string> FirstLines(size_t count, const std::vector<std::string>
 // some system calls in place of the kernel.
 bool AreProgramsEmulated();
 
-// The paths of the built programs.
+// The paths of the built programs. Under an emulator, these are paths of scripts that start them.
 std::string ToolPath();
 std::string SimulatorPath();
 std::string VerifyPath();

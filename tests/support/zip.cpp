@@ -12,7 +12,8 @@ constexpr uint16_t kVersion = 20;
 constexpr uint16_t kDescriptorFlag = 1 << 3;
 constexpr uint16_t kStored = 0, kDeflated = 8;
 
-// The true values for an item's data.
+// An item's bytes in the archive, and the values for its headers and data descriptor. `crc` and
+// `length` are those of item.data, even if the archive has item.raw in place of item.data.
 struct Facts {
   Bytes contents;
   uint32_t crc;

@@ -1,8 +1,9 @@
-// Writes ZIP archives, with true or with false fields.
+// Writes ZIP archives. A test can set false values in their headers and data descriptors.
 //
 // A length or CRC that an item leaves unset gets its true value. Exception: in the local header, it
-// is 0 if a data descriptor follows. A field that is set in `local`, `central` or `descriptor` is
-// written unchanged, only in that place.
+// is 0 if a data descriptor follows. A value that is set in `local` is written unchanged, and
+// only into the local header. The values of `central` are for the central header, and those of
+// `descriptor` are for the data descriptor.
 #pragma once
 
 #include <cstdint>
@@ -33,8 +34,9 @@ struct ZipItem {
   ZipClaim local = {}, central = {}, descriptor = {};
 };
 
-// The item with this uncompressed length in both headers and in the data descriptor. Exception: if
-// the item has a data descriptor, its local header claims 0.
+// The item with this uncompressed length in the central header and in the data descriptor. If the
+// item has a data descriptor, the local header has the length 0. Otherwise, the local header has
+// this length too.
 ZipItem ClaimingLength(ZipItem item, uint32_t length);
 
 // The archive of the items, in order. Names may occur twice.

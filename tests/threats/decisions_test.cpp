@@ -1,7 +1,6 @@
-// Tests the two refusals that no package of a signing tool causes: the refusal of an exponent of 1,
-// and the refusal of a library that has changed since it was read. The tests start from packages
-// that aapt and apksigner made. Most tests then forge the signature block, or change or replace a
-// library.
+// Tests two refusals: the refusal of an exponent of 1 or -1, and the refusal of a library that no
+// longer has the bytes that were read. The tests start from packages that aapt and apksigner made.
+// Most tests then forge the signature block, or change or replace a library.
 #include <sys/stat.h>
 
 #include <algorithm>
@@ -13,7 +12,7 @@
 
 namespace {
 
-// ---- With an exponent of 1, anyone can write signatures for any key.
+// ---- With an exponent of 1 or -1, anyone can forge signatures for any RSA modulus.
 
 // The victim's package with a forged signature block.
 Bytes WithForgedBlock(const Bytes& exponent) {
@@ -28,9 +27,10 @@ Bytes WithForgedBlock(const Bytes& exponent) {
   return ToBytes(ContentOf(apk));
 }
 
-// The first four bytes of each exponent are read as 1 or -1. Bytes 5 to 8, if there are any,
-// overwrite the length of the modulus. They are the first bytes of 00 01 00 00, which is 256 in
-// host byte order, so that the length does not change.
+// The tool reads the first four bytes of each exponent as 1 or -1. If an exponent is shorter, the
+// tool reads the missing bytes as 0. Bytes 5 to 8 of a longer exponent overwrite the length of the
+// modulus. These bytes agree with 00 01 00 00, which is 256 in host byte order, so that the length
+// does not change.
 TEST(Threat, ExponentOfOneOrMinusOneIsRefusedInEveryForm) {
   for (const char* exponent :
        {"01", "01 00", "01 00 00", "01 00 00 00", "FF FF FF FF", "01 00 00 00 00 01",
@@ -43,7 +43,8 @@ TEST(Threat, ExponentOfOneOrMinusOneIsRefusedInEveryForm) {
   }
 }
 
-// These exponents reach the check of the certificate's signature, which fails.
+// The tool does not refuse these exponents. It then checks the certificate's signature, and this
+// check fails.
 TEST(Threat, OtherExponentsReachTheCheckOfTheCertificate) {
   for (const char* exponent : {"00", "02", "03", "11", "7F", "01 00 01", "01 01", "00 01", "02 00",
                                "FE FF FF FF", "FF FF FF 7F", "FF FF FF", "FF", "00 00 00 01"}) {
@@ -63,8 +64,8 @@ class LibraryAfterItsCheck : public testing::Test {
     device_.Install("../system/program", ToBytes("\177ELF system"));
   }
 
-  // The files that are signed if `exchange` happens between the check and the signing: the package,
-  // and perhaps the library.
+  // Runs the steps, and calls `exchange` just before the tool opens the library the second time.
+  // Returns the files that are signed: the package, and perhaps the library.
   Strings FilesSigned(const std::function<void()>& exchange) {
     device_.phone.before_open = [=](const char* path, int) {
       seen_ += std::string(path).find("/mine/libx.so") != std::string::npos;

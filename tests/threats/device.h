@@ -40,15 +40,15 @@ class Device {
   // The absolute path for a path relative to the package's directory.
   std::string Path(const std::string& path) const { return temp_ / ("app/" + path); }
 
-  // Runs the steps. Returns the files that were signed with the payload for the key of `signer`, in
-  // order. Their names are relative to the directory above the package's directory.
+  // Runs the steps. Returns the files that the tool asks the Phone to sign with the payload for the
+  // key of `signer`, in the order of these requests. Also returns files that the Phone refuses to
+  // sign. The names are relative to the directory above the package's directory.
   Strings FilesSignedFor(const std::string& signer) {
     const std::string payload = "2000" + Hex(DigestOf(Digest::kSha256, ModulusOf(signer)));
     return FilesSignedWith(payload);
   }
 
-  // Runs the steps. Returns the names of the files whose payload begins with these hexadecimal
-  // digits.
+  // Like FilesSignedFor, for each payload that begins with the hexadecimal digits `payload`.
   Strings FilesSignedWith(const std::string& payload) {
     Strings files;
     phone.witness = [&](int fd, const std::string& event) {
@@ -63,7 +63,7 @@ class Device {
     return files;
   }
 
-  // Runs the steps. Returns the registrations with libzu: name and data.
+  // Runs the steps. Returns the registrations with libzu, each as "NAME DATA-HEX".
   Strings Registered() {
     RunSteps();
     Strings registered;

@@ -1,6 +1,5 @@
-// Some rules of the tool are lenient on purpose, or trust the file. Tests what hostile files can
-// achieve because of these rules, and what they cannot achieve. docs/threat-model.md explains the
-// reasons.
+// Some rules of the tool are lenient on purpose, or trust the file. Tests which attacks these rules
+// permit, and which attacks still fail. docs/threat-model.md gives the reasons for the rules.
 #include <sys/mman.h>
 #include <sys/wait.h>
 
@@ -27,7 +26,8 @@ Certificate CertificateOf(const std::string& key, uint64_t serial) {
   return certificate;
 }
 
-// A package whose block has the certificates and the SignerInfos of two keys, in these orders.
+// A package with two signers. Its block has, in order, a certificate for each key of `certificates`
+// and a SignerInfo for each key of `signers`.
 Package WithTwoSigners(const Strings& certificates, const Strings& signers) {
   Package package = MakePackage();
   const Bytes signature_file = package.Item("META-INF/CERT.SF").data;
@@ -77,7 +77,7 @@ TEST(Threat, FirstCertificateAndFirstSignatureOfTwoSignersCount) {
 // The certificate's modulus is the signer's modulus with four more bytes. The tool writes the fifth
 // to eighth bytes of the exponent over the modulus length (crypto/pkcs7.h). Here these bytes are 00
 // 01 00 00, which is 256 in host byte order, so the tool ignores the last four bytes of the
-// modulus. Other readers see a key of 2080 bits.
+// modulus. Other programs read a key of 2080 bits.
 TEST(Threat, ModulusWithExtraBytesIsTheKeyThatItStartsWith) {
   Package package = MakePackage();
   Certificate certificate;
@@ -205,8 +205,8 @@ Strings LibrariesWalked(const Package& package) {
   return names;
 }
 
-// The zip library compares an entry's two headers when the iteration reaches the entry. If the
-// headers differ, the library ends the iteration there.
+// When the iteration reaches an entry, the zip library compares the entry's local header with its
+// central directory header. If the headers differ, the zip library ends the iteration there.
 TEST(Threat, DamagedLibraryEndsTheIterationAndLaterOnesStayUnsigned) {
   const Strings names = {"lib/arm64-v8a/liba.so", "lib/arm64-v8a/libb.so", "lib/arm64-v8a/libc.so"};
   const Package intact = MakePackage(WithLibrariesNamed(names));
@@ -277,7 +277,7 @@ TEST(Threat, LibraryWrittenToThroughAMappingAfterItWasReadIsSigned) {
   device.phone.before_open = [&](const char* path, int) {
     opened += library == path;
     if (opened != 2) return;
-    usleep(20000);  // the clock of file systems is coarse
+    usleep(20000);  // lets the coarse clock of the file's times advance
     bytes[5] = 'F';
   };
   EXPECT_EQ(BytesSigned(device)[library], "\177ELF Foo");
@@ -310,7 +310,7 @@ TEST(Threat, JarWrittenToInPlaceAfterItWasTrustedIsSigned) {
 }
 
 // The zip library maps the archive's central directory, so a read of the lost part raises SIGBUS.
-// Files that were signed before stay signed.
+// Files that were signed before the signal stay signed.
 TEST(Threat, FileThatShrinksMeanwhileEndsTheProcess) {
   PackageOptions options = WithLibrariesNamed({"lib/arm64-v8a/libfoo.so"});
   for (int i = 0; i < 1000; ++i) options.entries.push_back({"assets/" + std::to_string(i), {}});

@@ -19,7 +19,7 @@ std::string HexDigest(Digest digest, const std::string& text) {
   return Hex(out);
 }
 
-// The output of `openssl dgst -NAME` for `bytes`.
+// The hexadecimal digest that `openssl dgst -NAME` prints for `bytes`, or "no answer".
 std::string OpensslDigest(const std::string& name, const Bytes& bytes) {
   const DiskFile file(bytes);
   const std::string command = "openssl dgst -r -" + name + " " + file.path();

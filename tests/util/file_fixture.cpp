@@ -29,7 +29,8 @@ ssize_t __wrap_readlink(const char* path, char* buffer, size_t size) {
   return kernel.readlink ? kernel.readlink(buffer, size) : __real_readlink(path, buffer, size);
 }
 
-// The names of read and readlink in a build with _FORTIFY_SOURCE, as in every platform tree.
+// In a build with _FORTIFY_SOURCE, calls of read and readlink become calls of these functions.
+// Every platform tree defines _FORTIFY_SOURCE.
 ssize_t __wrap___read_chk(int fd, void* buffer, size_t size, size_t /*room*/) {
   return __wrap_read(fd, buffer, size);
 }

@@ -1,5 +1,5 @@
-// ReadFile, OpenForReading and IsSameFile with real files, and with results that the kernel returns
-// for real files only by chance.
+// ReadFile, OpenForReading, IsSameFile and StringToVector. The tests use real files. They also
+// simulate results that the kernel rarely returns for real files.
 #include "util/file.h"
 
 #include <fcntl.h>
@@ -158,7 +158,7 @@ TEST_F(ReadFileTest, FileThatCannotBeRewoundHasNoSize) {
   ExpectNoSize(MakeFile("abc"));
 }
 
-// The results are those for a file that grows or shrinks between fstat and lseek.
+// Simulates a file that shrinks or grows between fstat and lseek.
 TEST_F(ReadFileTest, SizeComesFromLseekAndNotFromFstat) {
   for (const off_t end : {off_t{2}, off_t{5}}) {
     kernel.lseek = [end](int whence) { return whence == SEEK_END ? end : off_t{0}; };
@@ -266,7 +266,8 @@ TEST_F(ReadFileTest, DescriptorOfADirectoryHasNoSizeAndStaysOpen) {
 
 // ---- The memory of the vector.
 
-// tests/apk/memory_test.cpp checks that ReadFile frees the vector's former memory first.
+// tests/apk/memory_test.cpp checks that ReadFile frees the vector's old memory before it allocates
+// new memory.
 TEST_F(ReadFileTest, EmptyVectorGetsNoMoreMemoryThanTheFileNeeds) {
   Bytes out(1000);
   out.clear();
@@ -284,7 +285,7 @@ TEST_F(ReadFileTest, EmptyVectorWithMemoryEnoughKeepsIt) {
   EXPECT_EQ(Bytes(1000, 'x'), out);
 }
 
-// ---- Without waiting for a writer, but with waiting for the holder of a lease.
+// ---- Opening waits for the holder of a lease, but not for a writer of a FIFO.
 
 TEST_F(OpenForReadingTest, FifoIsOpenedWithoutWaiting) {
   ASSERT_EQ(0, mkfifo(Path("fifo").c_str(), 0600));
@@ -382,7 +383,7 @@ TEST(IsSameFile, EachPartOfTheStateCounts) {
   }
 }
 
-// Both states are equal, but neither is the state of a regular file.
+// Each state is compared with itself, but is not the state of a regular file.
 TEST(IsSameFile, FilesThatAreNotRegularAreNotTheSame) {
   struct stat state = {};
   EXPECT_FALSE(IsSameFile(state, state));

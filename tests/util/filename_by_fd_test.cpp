@@ -39,9 +39,9 @@ TEST_F(GetFilenameByFdTest, ClosedDescriptorHasNoPath) {
   EXPECT_EQ(Records(), log.records());
 }
 
-// Nested directories, of which the innermost has a path of `path_length` bytes. Each one is made
-// and opened relative to its parent, because the full path may be longer than the kernel accepts.
-// The destructor removes them.
+// Nested directories below `top`. The path of the innermost directory has `path_length` bytes. Each
+// directory is made and opened relative to its parent, because the full path may be longer than the
+// kernel accepts. The destructor removes the nested directories, but not `top`.
 class DeepDirectory {
  public:
   DeepDirectory(const std::string& top, size_t path_length) {

@@ -26,12 +26,13 @@ using nlohmann::json;
 // Flags of vectors whose result can differ from the tool's verdict. AcceptedShortPadding is this
 // project's flag. It marks vectors that are invalid by RFC 8017, and that the tool accepts on
 // purpose. WrongHash is Wycheproof's flag. It marks signatures that are made with another digest
-// than the key is for. The tool accepts any digest that it knows, because the signature itself
-// names its digest.
+// algorithm than that of their test group. The tool accepts each algorithm in kDigests, because the
+// signature itself names its algorithm.
 constexpr char kAcceptedShortPadding[] = "AcceptedShortPadding";
 constexpr char kWrongHash[] = "WrongHash";
 
-// The digests that the tool knows. It refuses even a good signature over any other digest.
+// The digest algorithms that the tool accepts. The tool refuses a signature with any other digest
+// algorithm, even a good signature.
 constexpr const char* kDigests[] = {"MD5", "SHA-1", "SHA-256"};
 
 struct Counts {
@@ -68,8 +69,8 @@ Bytes WithoutLeadingZeros(Bytes number) {
 
 class Key {
  public:
-  // In an older file, a test group has the key's numbers in "n" and "e". In a newer file, the group
-  // has them in "publicKey".
+  // In an older file, a test group has the modulus in "n" and the exponent in "e". In a newer
+  // file, the group has both numbers in "publicKey".
   explicit Key(const json& group) {
     const bool is_newer = group.contains("publicKey") && group["publicKey"].is_object();
     const json& key = is_newer ? group["publicKey"] : group;
@@ -121,7 +122,8 @@ bool HasFlag(const json& test, const char* flag) {
   return std::find(flags.begin(), flags.end(), flag) != flags.end();
 }
 
-// Compares the tool's verdict on a vector with the vector's own result, and counts the vector.
+// Counts the vector. If the signature is as long as the modulus, also checks that the vector's
+// result and flags allow the tool's verdict.
 void Judge(const Key& key, const std::string& sha, const json& test, Counts* counts) {
   const Bytes message = FromHex(test.at("msg"));
   const Bytes signature = FromHex(test.at("sig"));

@@ -5,8 +5,8 @@
 #include <climits>
 #include <cstring>
 
-// Compares the names of all error numbers with those of the C library. The highest number that a
-// system call can return is 4095.
+// Compares the names of all error numbers with the names in the C library. The highest error number
+// that a system call can return is 4095.
 TEST(ErrorName, IsTheNameThatTheCLibraryHas) {
   constexpr int kLast = 4095;
   int named = 0;

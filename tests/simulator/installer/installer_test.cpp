@@ -15,7 +15,7 @@ using namespace simulator;
 
 namespace {
 
-// While an object exists, `script` is the first program named java on PATH.
+// While a FakeJava exists, `script` is the first program named java on PATH.
 class FakeJava {
  public:
   explicit FakeJava(const std::string& script) : path_(getenv("PATH")) {

@@ -19,8 +19,8 @@ XmlAttribute Boolean(const std::string& name, bool value) {
 
 constexpr CompiledXml::Pool kPools[] = {CompiledXml::Pool::kUtf8, CompiledXml::Pool::kUtf16};
 
-// The value of extractNativeLibs that is read from a manifest whose application has these
-// attributes.
+// Parses a manifest whose <application> element has `attributes`. Returns the parsed value of
+// extractNativeLibs.
 std::optional<bool> Extracts(const std::vector<XmlAttribute>& attributes,
                              CompiledXml::Pool pool = CompiledXml::Pool::kUtf8) {
   CompiledXml xml(pool);
@@ -30,7 +30,7 @@ std::optional<bool> Extracts(const std::vector<XmlAttribute>& attributes,
   return ParseAndroidManifest(xml.Build()).extracts_libraries;
 }
 
-// Returns the document after every offset in its string pool was changed to that of the longest
+// Returns the document with every offset in the string pool changed to the offset of the longest
 // string. The 203 strings then have 5000 bytes each, together about 90 times the 11244 bytes of the
 // document.
 Bytes WithStringsInOneAnother(Bytes bytes) {

@@ -19,8 +19,8 @@ namespace {
 
 using Lines = std::vector<std::string>;
 
-// An entry that the platform's library does not find, because its local header has another CRC than
-// the central directory.
+// An entry whose CRC in the local header differs from the CRC in the central directory. The
+// platform's library refuses this entry.
 ZipItem Damaged(const std::string& name) {
   ZipItem item = {name, ToBytes("data of " + name)};
   item.local.crc = 1;
@@ -62,8 +62,8 @@ TEST(Archive, DamagedEntryIsMarkedAndOthersAreListed) {
             Lines({"a 9", "b 9 damaged", "c 9"}));
 }
 
-// The zip library chooses the order in which Walk() meets the entries, so the test damages each
-// entry in turn.
+// The zip library chooses the order of Walk(). The test therefore finds out this order first, and
+// then damages each entry in turn.
 TEST(Archive, WalkShowsWhereTheToolStops) {
   const Lines names = {"lib/x/a.so", "lib/x/b.so", "lib/x/c.so"};
   const Lines order = WalkOf(BuildZip({Good(names[0]), Good(names[1]), Good(names[2])})).names;
@@ -120,8 +120,8 @@ TEST(Archive, LongEntriesAreNotRead) {
   EXPECT_EQ(content.size(), Archive::kLongestRead);
 }
 
-// An entry whose length does not fit its data is damaged, and not too long, even if this length is
-// above kLongestRead.
+// An entry counts as damaged if its compressed data is too short for the length that the entry
+// claims. It does not count as too long, even if the claimed length is above kLongestRead.
 TEST(Archive, EntryThatClaimsTooMuchIsDamaged) {
   const MemoryFile file(BuildZip(
       {ClaimingLength({"liar", Bytes(100, 'a'), true}, Archive::kLongestRead + 1), Good("a")}));
@@ -158,7 +158,7 @@ TEST(Archive, SurvivesAFileThatShrinks) {
   EXPECT_FALSE(archive.HasShrunk());
 }
 
-// A SIGBUS outside a guard ends the process.
+// A SIGBUS ends the process if no ShrinkGuard exists.
 TEST(ShrinkGuardDeathTest, GuardsOnlyWhileItExists) {
   const auto touch = [](bool guarded) {
     const int fd = memfd_create("page", MFD_CLOEXEC);

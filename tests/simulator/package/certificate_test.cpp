@@ -16,7 +16,8 @@ std::string_view View(const Bytes& bytes) {
   return {reinterpret_cast<const char*>(bytes.data()), bytes.size()};
 }
 
-// The output of a shell command, in which $0 is a file with the certificate.
+// The output of the shell command, without line feeds at its end. In the command, $0 is a file with
+// the certificate.
 std::string Told(const Bytes& certificate, const std::string& command) {
   const DiskFile file(certificate);
   const ProcessResult run = RunProcess({"bash", "-o", "pipefail", "-c", command, file.path()});
@@ -34,7 +35,7 @@ Certificate Of(const std::string& key) {
 
 }  // namespace
 
-// The expected values are those of openssl and coreutils.
+// The expected digests are those that openssl and coreutils print.
 TEST(CertificateFacts, MatchOpensslForAnRsaKey) {
   const Bytes der = Of("rsa-2048").Build();
   const auto facts = ParseCertificate(View(der));
@@ -67,7 +68,7 @@ TEST(CertificateFacts, LastSecondMayBeBefore1970OrAfter2049) {
         der::Sequence({der::Element(der::kUtcTime, "500102030405Z"), der::Element(tag, end)});
     const Bytes made = certificate.Build();
     const auto facts = ParseCertificate(View(made));
-    if (!facts) return std::string("none");  // newer libraries refuse the end "no time"
+    if (!facts) return std::string("none");  // newer versions of libcrypto do not parse "no time"
     const std::string told = facts->not_after ? std::to_string(*facts->not_after) : "none";
     const std::string command =
         "date +%s -d \"$(openssl x509 -inform DER -in \"$0\" -noout -enddate | sed s/.*=//)\"";
@@ -125,8 +126,8 @@ TEST(CertificateFacts, CutCertificateHasNone) {
   }
 }
 
-// The certificate names the algorithm of its signature twice. The name outside the signed part
-// counts.
+// A certificate has two AlgorithmIdentifiers for its signature. ParseCertificate reads the one
+// outside the signed part.
 TEST(CertificateFacts, AlgorithmOutsideTheSignedPartCounts) {
   Certificate certificate = Of("rsa-2048");
   certificate.tbs_algorithm = AlgorithmIdentifier(RsaSignatureOid(Digest::kSha1));
@@ -186,8 +187,8 @@ TEST(CertificateFacts, BytesAfterTheCertificateAreIgnored) {
   EXPECT_EQ(ParseCertificate(View(der))->sha256, digest);
 }
 
-// The expected texts are the owners that keytool prints. keytool uses a class of the JDK to write
-// names, so its texts are those of the JDK.
+// The expected names are those that keytool prints after "Owner". keytool uses a class of the JDK
+// to write them.
 TEST(CertificateName, IsWhatTheJdkWrites) {
   const std::vector<Bytes> names = {
       Name({{"2.5.4.6", "AB"},

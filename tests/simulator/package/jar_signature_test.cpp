@@ -16,7 +16,7 @@ PackageFacts FactsOf(const Package& package) { return LookAt(DiskFile(package.Bu
 
 JarSignatureFacts SignatureOf(const Package& package) { return FactsOf(package).jar; }
 
-// A package whose certificate has this RSAPublicKey.
+// A package whose certificate has the RSAPublicKey of `modulus` and `exponent`.
 Package WithKey(const Bytes& modulus, const Bytes& exponent) {
   Certificate certificate;
   certificate.public_key_info =

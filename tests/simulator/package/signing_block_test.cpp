@@ -70,7 +70,7 @@ TEST(SigningBlock, DamageKeepsTheSignersBeforeIt) {
   EXPECT_EQ(Read(Bytes(31, 0)), Lines({"damaged"}));
 }
 
-// At each depth, one length reaches past the end of the enclosing element.
+// Each of these blocks has one length that reaches past the end of the enclosing element.
 TEST(SigningBlock, LengthsThatReachTooFarAreDamage) {
   const Bytes whole = Signers({kSigner});
   for (size_t field : {0, 4, 8, 12, 16, 20}) {
@@ -79,7 +79,7 @@ TEST(SigningBlock, LengthsThatReachTooFarAreDamage) {
     EXPECT_EQ(Read(SigningBlockBytes({{kSchemeV2, value}})), Lines({"damaged"})) << field;
   }
   Bytes block = SigningBlockBytes({{kSchemeV2, whole}});
-  block[8 + 7] = 0xff;  // the pair's own length
+  block[8 + 7] = 0xff;  // the highest byte of the pair's length
   EXPECT_EQ(Read(block), Lines({"damaged"}));
 }
 
@@ -125,14 +125,14 @@ TEST(ReadSigningBlock, FindsNothingWithoutMagicOrRoom) {
   other.back() = '3';
   EXPECT_EQ(ReadFrom(other), "");
   Bytes too_long = block;
-  too_long[too_long.size() - 18] = 0x7f;  // its size, in the footer
+  too_long[too_long.size() - 18] = 0x7f;  // the second highest byte of the second size field
   EXPECT_EQ(ReadFrom(too_long), "");
   Bytes too_short = block;
   for (size_t i = 0; i < 8; ++i) too_short[too_short.size() - 24 + i] = 0;
   EXPECT_EQ(ReadFrom(too_short), "");
 }
 
-// The platform accepts a block only if it has the same size at its start and at its end.
+// The platform accepts a block only if the size fields at its start and at its end are equal.
 TEST(ReadSigningBlock, FindsNothingIfTheTwoSizesDiffer) {
   Bytes block = SigningBlockBytes({{kSchemeV2, Signers({kSigner})}});
   ++block[0];

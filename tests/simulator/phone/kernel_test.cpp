@@ -123,8 +123,8 @@ TEST(KernelVerify, RefusesWithTheErrorOfThePhone) {
 }
 
 TEST(KernelFcntl, OtherCommandsGoToTheRealKernel) {
-  // The numbers next to the feature's own commands (1124 and 1125), an unknown command, a
-  // descriptor that is not open, and commands with an argument.
+  // The feature's own commands are 1124 and 1125. The commands below are 1123 and 1126, an unknown
+  // command, a command for a descriptor that is not open, and commands that the real kernel knows.
   const Lines commands = {"fcntl 3 1123 0",
                           "fcntl 3 1126 0",
                           "fcntl64 3 1123 0",

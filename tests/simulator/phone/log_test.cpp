@@ -28,7 +28,7 @@ TEST(Log, KeepsPriorityTagAndText) {
                                LogEvent(5, "tag", "%")}));
 }
 
-// The platform's zip library logs its warnings as the probe's command "log-data" does.
+// The probe's command "log-data" logs with the function that the platform's zip library calls.
 TEST(Log, KeepsWhatThePlatformsLibrariesWriteByThemselves) {
   const ProbeRun run = Probe({"log-data 5 ziparchive 5a6970"}).Run();
   EXPECT_EQ(run.results, Lines({"0 77"}));

@@ -115,8 +115,8 @@ long WriteId(const Words&) {
   return 0;
 }
 
-// The number of descriptors from 3 to 19999 that exec would leave open. The simulator's libraries
-// in this process also have descriptors in this range, for example the journal's.
+// The number of descriptors from 3 to 19999 that exec would leave open. The journal's descriptor is
+// also in this range, but must not be counted: exec must close this descriptor.
 long Inherited(const Words&) {
   long count = 0;
   for (int fd = 3; fd < 20000; ++fd) {

@@ -30,7 +30,8 @@ ProbeRun Probe::Run(const Lines& options) const {
   run.status = result.status;
   run.errors = result.errors;
   run.results = LinesOf(ContentOf(path() + ".out"));
-  // The first line is not the result of a command. It has the probe's descriptor for its script.
+  // The first line is not the result of a command. It has the descriptor that the probe got for the
+  // file of commands.
   EXPECT_EQ(run.results.empty() ? "" : run.results[0], "fd 3");
   if (!run.results.empty()) run.results.erase(run.results.begin());
   run.events = ParseJournal(result.output);

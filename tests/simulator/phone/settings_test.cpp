@@ -10,7 +10,7 @@ using namespace simulator;
 
 namespace {
 
-// Sets these environment variables. The destructor removes them.
+// Sets environment variables ("NAME=VALUE" each). The destructor removes these variables.
 class Environment {
  public:
   explicit Environment(const Lines& assignments) {

@@ -32,7 +32,7 @@ TEST(Events, NumbersAreWholeOrZero) {
   EXPECT_EQ(NumberOf(Json::parse(R"({})"), "a"), 0);
 }
 
-// A missing answer does not count as success.
+// A `result` that is missing or not a number does not count as success.
 TEST(Events, SuccessIsTheResultZero) {
   EXPECT_TRUE(IsSuccess(Json::parse(R"({"result":0})")));
   EXPECT_FALSE(IsSuccess(Json::parse(R"({"result":-1})")));

@@ -16,8 +16,8 @@ namespace {
 namespace fs = std::filesystem;
 using Lines = std::vector<std::string>;
 
-// The listed names, without the path of `directory`. A name for which the tool is not run also has
-// the reason. If ListFiles failed, the only line is its message.
+// One line for each listed name, without the path of `directory`. If the tool is not run for the
+// name, the line ends with the reason. If ListFiles failed, the only line is its message.
 Lines Listed(const TempDir& directory, const FileListOptions& options, size_t* others = nullptr) {
   FileList list;
   if (const auto problem = ListFiles(options, &list)) return {*problem};
@@ -87,7 +87,8 @@ TEST(FileList, DirectoryWithoutPackagesIsReported) {
             Lines({"empty: no packages", "full/a.apk"}));
 }
 
-// A path has at most 4095 bytes. The first directory with a longer path cannot be read.
+// Linux accepts paths of at most 4095 bytes. The test makes directories with longer paths.
+// ListFiles cannot read the first of them.
 TEST(FileList, DirectoryThatCannotBeReadIsReported) {
   const TempDir directory;
   directory.Write("deep/a.apk", {});

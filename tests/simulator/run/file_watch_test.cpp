@@ -16,7 +16,8 @@ namespace {
 // The digest of "abc" (FIPS 180-2, appendix B.1).
 const std::string kSha256 = "ba7816bf8f01cfea414140de5dae2223b00361a396177a9cb410ff61f20015ad";
 
-// True if `change` makes the run end without a result, because the file was changed.
+// True if FileWatch gives the run the failure kChanged after `change`. `sha256` is the file's
+// digest in the facts of the run.
 bool IsNoticed(const std::function<void(const std::string& file)>& change,
                const std::string& sha256 = kSha256) {
   const TempDir directory;

@@ -212,9 +212,9 @@ TEST(Installation, SaysWhenItCannotWrite) {
 }
 
 // A write lease (F_SETLEASE) delays every other open() of the file. With the flag O_NONBLOCK,
-// open() fails at once instead. The installation uses this flag. If its open() fails, it leaves the
-// package where it is. In a whole run, the tool then waits for the end of the lease, and the report
-// names the lease.
+// open() fails at once instead. LayOut() opens the package with this flag. If open() fails, the
+// package stays where it is. In a whole run, the tool then waits for the end of the lease, and the
+// report names the lease.
 TEST(Installation, DoesNotWaitForALease) {
   const TempDir directory;
   const std::string file = directory / "base.apk";
@@ -295,7 +295,7 @@ TEST(Installation, ReportsAMissingTemporaryDirectory) {
   EXPECT_EQ(problem.value_or("").substr(0, 8), "TMPDIR: ");
 }
 
-// An interruption ends the installation at once, even if time is left.
+// An interruption ends LayOut() at once, even before the deadline.
 TEST(Installation, FailsAfterAnInterruption) {
   const TempDir directory;
   const std::string file = directory / "base.apk";
@@ -330,7 +330,8 @@ TEST(Installation, IsMadeForAPackageWithoutLibrariesBesideIt) {
     EXPECT_TRUE(is_laid_out(InstallWhen::kAlways)) << place;
     fs::remove_all(directory / "lib");
   }
-  // A link can be in a directory other than the package's, but the tool looks beside the package.
+  // A symbolic link to the package can be in another directory. The tool looks for libraries beside
+  // the package, not beside the link.
   const TempDir links;
   fs::create_symlink(file, links / "base.apk");
   fs::create_directories(directory / "lib/arm64");
@@ -339,7 +340,8 @@ TEST(Installation, IsMadeForAPackageWithoutLibrariesBesideIt) {
             std::nullopt);
   EXPECT_FALSE(of_link.is_done());
   fs::remove_all(directory / "lib");
-  // If lib is a link to itself, nobody can see whether lib/arm64 exists.
+  // If lib is a link to itself, lstat() of lib/arm64 fails. LayOut() then assumes that lib/arm64
+  // exists.
   fs::create_symlink("lib", directory / "lib");
   EXPECT_FALSE(is_laid_out(InstallWhen::kAlone));
 }

@@ -1,5 +1,6 @@
-// Tests that TakeApart assigns each answer of the kernel to the right file. The step that the tool
-// is in and the path decide which file this is.
+// Tests that TakeApart assigns each answer of the kernel to a library or to the file itself. While
+// the tool signs libraries or the file, the tool's step decides. At other times, the path in the
+// event decides.
 #include "simulator/run/run_record.h"
 
 #include <gtest/gtest.h>
@@ -46,7 +47,7 @@ Lines SignedBy(const Events& events) {
 
 }  // namespace
 
-// The step counts more than the path, because the file may have been moved during the run.
+// The step counts more than the path, because a file may be moved during the run.
 TEST(RunRecord, StepOfTheToolCountsMoreThanThePath) {
   EXPECT_EQ(SignedBy({kFileBegins, Sign("/data/app/moved.apk")}), Lines({"own"}));
   EXPECT_EQ(SignedBy({Log("VeltSignJni starts: 3.\n"), Sign(kFile)}), Lines({kFile}));

@@ -41,7 +41,7 @@ TEST(SignedBytes, AreTrustedWithoutReadingIfTheFileIsUnchanged) {
   const std::string file = directory.Write("file", ToBytes("abc"));
   SignedBytes bytes("", true);
   EXPECT_TRUE(bytes.Add(file, kLater));
-  // The file need not be read for this answer.
+  // The deadline has passed, so Holds must answer without reading the file.
   EXPECT_TRUE(bytes.Holds(file, kPassed));
   directory.Write("file", ToBytes("abd"));
   EXPECT_FALSE(bytes.Holds(file, kLater));

@@ -13,7 +13,7 @@ using namespace simulator;
 
 namespace {
 
-// 2026-11-22 09:08:07 UTC, as "date -u -d @1795338487" prints it.
+// 2026-11-22 09:08:07 UTC. `date -u -d @1795338487` prints this time.
 constexpr std::time_t kBegun = 1795338487;
 
 std::string PageOf(const std::vector<Report>& reports) {
@@ -34,7 +34,7 @@ size_t Count(const std::string& page, const std::string& part) {
   return count;
 }
 
-// Everything between "<" and ">", which a browser reads as markup.
+// The tags of the page: each "<", and the text up to the next ">".
 std::vector<std::string> TagsOf(const std::string& page) {
   static const std::regex kTag("<[^>]*>");
   return {std::sregex_token_iterator(page.begin(), page.end(), kTag), {}};
@@ -88,7 +88,6 @@ TEST(Page, BeginsAsEveryPageDoes) {
   EXPECT_EQ(PageOf(Example(Verdict::kSigned)).substr(0, kPageStart.size()), kPageStart);
 }
 
-// The page loads nothing from elsewhere, and runs no script.
 TEST(Page, HasNoScriptAndNothingFromElsewhere) {
   const std::string page = PageOf(HostileReport("x"));
   EXPECT_TRUE(Has(page, "content=\"default-src 'none'; style-src 'unsafe-inline'; "));
@@ -101,9 +100,9 @@ TEST(Page, HasNoScriptAndNothingFromElsewhere) {
   EXPECT_FALSE(std::regex_search(page, std::regex("@import|https?:|url\\((?!#)")));
 }
 
-// A name with markup in it changes only the texts.
+// A file name that contains markup changes only the page's texts, not its tags.
 TEST(Page, HasTheSameMarkupWhateverFilesAreCalled) {
-  // The plain name has a directory, because the hostile name has one.
+  // Both names contain "/", so both pages have the element for the common directory of the files.
   const std::string plain = PageOf({HostileReport("x/x"), HostileReport("x/x")});
   const std::string hostile = PageOf({HostileReport(kHostileText), HostileReport(kHostileText)});
   EXPECT_EQ(TagsOf(hostile), TagsOf(plain));
@@ -175,7 +174,7 @@ TEST(Page, ShowsEverythingUpToTheLimits) {
   EXPECT_LT(page.find(">a<"), page.find(">bbb")) << "in the order of the terminal";
 }
 
-// The euro sign has three bytes.
+// The euro sign has three bytes in UTF-8. The page shows all three bytes of a euro sign, or none.
 TEST(Page, CutsNoCharacterInTwo) {
   Report report = Example(Verdict::kSigned);
   for (size_t i = 0; i < 3; ++i) {

@@ -21,8 +21,8 @@ std::string Printed(const Report& report, const Look& look = kUtf8,
   return out.str();
 }
 
-// A report with items that are done, that are refused, and that have nothing to sign. It has no
-// signer and no events.
+// A report with items that are done, one refused item, and one item that has nothing to sign. The
+// report has no signer and no events.
 Report Example() {
   Report report;
   report.file = "base.apk";
@@ -175,8 +175,9 @@ TEST(ReportText, NamesWidenTheColumnUpTo40Characters) {
   EXPECT_EQ(column(longest + "l"), 4U + 40 + 2);
 }
 
-// For neighbouring items with the same cause, the cure is printed once. The lines are the verdict,
-// the three items, and the two lines of the cure.
+// Items a and b have the same cause, and its cure is printed once. No cure is printed for item c,
+// because its cause follows from another cause. The six lines are the verdict, the three items, and
+// the two lines of the cure.
 TEST(ReportText, NeighboursWithTheSameCausePrintOneCure) {
   Report report = Example();
   report.items = {

@@ -147,8 +147,8 @@ TEST(Sarif, HostileTextsKeepMarkupButNoEscapeCharacter) {
 }
 
 // RFC 3986 §2.3 lists the characters that need no percent-encoding. The "/" of a path is not
-// encoded either. A colon is encoded, because the part before it would otherwise read as the scheme
-// of a URI (§4.2).
+// encoded either. A colon in a path is encoded: otherwise, a program could read the part before the
+// colon as the scheme of a URI (§4.2).
 TEST(UriOf, EncodesAllButUnreservedCharactersAndSlashes) {
   EXPECT_EQ(UriOf("base.apk"), "base.apk");
   EXPECT_EQ(UriOf("../a-b/c_d~e.apk"), "../a-b/c_d~e.apk");

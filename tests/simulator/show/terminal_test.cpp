@@ -23,7 +23,7 @@ TEST(Printable, ControlCharactersAndInvalidUtf8AreShownAsBytes) {
   EXPECT_EQ(Printable("\xe9\xff", kUtf8), "\\xe9\\xff");
 }
 
-// For example, U+202E turns the text after it: "gpj.exe" looks like "exe.jpg".
+// For example, U+202E shows the text after it from right to left: "gpj.exe" looks like "exe.jpg".
 TEST(Printable, CharactersThatTurnOrHideTextAreShownAsBytes) {
   EXPECT_EQ(Printable("a\u202eb", kUtf8), "a\\xe2\\x80\\xaeb");
   EXPECT_EQ(Printable("\u200b\u2028\u2066\ufeff", kUtf8),

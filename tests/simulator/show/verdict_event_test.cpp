@@ -135,7 +135,7 @@ TEST(VerdictEvent, HoldsTheWholeReport) {
       {"link": "manifest", "state": "not-reached", "text": "y"}]})json"));
 }
 
-// The simulator does not know the version of another tool.
+// The simulator knows the version of only one tool: the tool beside the simulator.
 TEST(VerdictEvent, OtherToolHasADigestAndNoVersion) {
   Report report;
   report.tool = {false, "88"};
@@ -199,8 +199,8 @@ TEST(VerdictEvent, EveryStateOfALinkHasACode) {
   EXPECT_EQ(chain[2]["state"], "not-reached");
 }
 
-// The event lists a signer of scheme v1 with the digest of the package's key, even if no
-// certificate was read.
+// If the report has a key but no certificate, the event still lists a signer of scheme v1. This
+// signer has the digest of the key's modulus.
 TEST(VerdictEvent, KeyWithoutACertificateIsReportedAsV1Signer) {
   Report report;
   report.key = {"ab", 2048, true};

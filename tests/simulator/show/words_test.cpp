@@ -73,7 +73,7 @@ TEST(HeadFacts, NameTheSignerAndTheKernelsKey) {
             Lines({"com.app", "signer CN=a, RSA-2048, key 98302ce8...f64646"}));
   report.key->bits = 0;
   EXPECT_EQ(HeadFacts(report, "…")[1], "signer CN=a, RSA, key 98302ce8…f64646");
-  // A payload can have any length. A short one is shown whole.
+  // A payload can have any length. A short payload is shown whole.
   report.key->sha256 = "ab";
   EXPECT_EQ(HeadFacts(report, "…")[1], "signer CN=a, RSA, key ab");
   report.key->sha256 = "98302ce800f64646";
@@ -140,7 +140,8 @@ TEST(HeadFacts, HaveASignerWhoWasNotExpectedBesideAnyReason) {
   report.verdict = Verdict::kNotAccepted;
   report.items = {signer};
   EXPECT_EQ(HeadFacts(report, "..."), Lines({"its signer is not one that --signer names: who"}));
-  // The reason signer-not-verified follows from the refusal, so the line does not show it.
+  // The cause signer-not-verified is only a consequence of the refused package, so HeadFacts leaves
+  // this cause out.
   report.verdict = Verdict::kRefused;
   report.items = {Library(&cause::kLibraryMissing), signer};
   report.items[0].state = ItemState::kRefused;
@@ -172,8 +173,8 @@ TEST(SignerRows, SayWhetherTheKernelGotTheKey) {
                              "98302ce8 (of the modulus alone: what the kernel got)"));
   report.key->was_got = false;
   EXPECT_EQ(SignerRows(report)[5].second, "98302ce8 (of the modulus alone, as the tool reads it)");
-  // The certificate is also shown if the crypto library cannot read its key. The kernel's key is
-  // also shown if the certificate is missing.
+  // The certificate is shown even if the crypto library cannot read its key. The kernel's key is
+  // shown even if the certificate is missing.
   report.signer->key = {"RSA", 0, "spki", ""};
   EXPECT_EQ(SignerRows(report).size(), 5U);
   EXPECT_EQ(SignerRows(report)[3].first, "public key SHA-256 digest");

@@ -34,7 +34,7 @@ Report SignedBy(const CertificateFacts& signer, const std::string& file = "base.
   return report;
 }
 
-// The judgement of phones that install the package for these signers.
+// The judgement of the phones from API level `first` on, which install the package for `signers`.
 RangeJudgement Takes(int first, const std::vector<InstallerSigner>& signers) {
   RangeJudgement range;
   range.levels = {first, kNewestLevel};
@@ -100,8 +100,8 @@ TEST(ReadDigest, RejectsOtherForms) {
   for (const std::string& text :
        {std::string(), digits, digits + "000", digits + "0", digits + "0g", digits + " 0",
         "0x" + digits, digits + "0\n", ":" + digits + "0", digits + ":00",
-        // These texts are as long as 32 pairs with colons between them, but their colons are
-        // missing or in other places.
+        // The next texts have 95 characters, as many as 32 pairs of digits with colons between
+        // them. The colons are missing or at wrong positions.
         std::string(64, '0') + std::string(31, ':'), std::string(95, '0'), std::string(95, ':')}) {
     EXPECT_EQ(ReadDigest(text), std::nullopt) << text;
   }
@@ -164,7 +164,8 @@ TEST(Gate, KeyWithoutACertificateIsKnownByItsModulus) {
   ExpectUnexpected({kOwner.key.modulus_sha256}, report);
 }
 
-// Anyone can make signatures for the owner's modulus with a forgeable exponent such as 1.
+// If a key has a forgeable exponent such as 1, anyone can make signatures that the key verifies. A
+// forger can combine this exponent with the owner's modulus.
 TEST(Gate, ForgeableKeyIsRejectedEvenIfExpected) {
   Report report = SignedBy(kOwner);
   report.warnings = {{&cause::kForgeableKey, "1"}};

@@ -28,7 +28,7 @@ Judgement Judged(const std::vector<RangeJudgement>& ranges) {
   return {Judgement::State::kJudged, "", ranges};
 }
 
-// The item's code and text; empty if no item was added.
+// The code and text of the item that AddInstallerItem adds; empty if it adds no item.
 std::string Told(const Judgement& judgement) {
   std::vector<Item> items;
   AddInstallerItem(judgement, {}, &items);
@@ -95,7 +95,8 @@ TEST(InstallerItem, VerifierThatGaveUpIsARefusal) {
             "installer-gave-up: the installer's verifier gave up: it ended");
 }
 
-// Phones use the newest scheme that they know, with all of its signers.
+// A phone verifies only the newest of the package's schemes that the phone knows. All signers of
+// that scheme count.
 TEST(OtherSigner, IsOneOfTheNewestScheme) {
   Report report;
   report.signer = WithKey("own");

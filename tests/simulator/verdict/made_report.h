@@ -54,7 +54,8 @@ inline Report Made(const Events& events, const PackageFacts& facts = {},
   return MakeReport(Record(events, end), facts, options);
 }
 
-// "name state code detail", one line for each item.
+// One line for each item: "name state", then the code of the cause and the detail if the item has
+// them.
 inline Lines ItemsOf(const Report& report) {
   Lines lines;
   for (const Item& item : report.items) {
@@ -71,7 +72,8 @@ inline Lines Items(const Events& events, const PackageFacts& facts = {}) {
   return ItemsOf(Made(events, facts));
 }
 
-// The tool's log lines before it asks the kernel to sign, and at the start of each step.
+// Log lines of the tool. kTakesUp is the line before the tool asks the kernel to sign a package or
+// its library. The other two lines start the steps that sign the libraries and the file.
 inline const Json kTakesUp = Log(4, "VeltSignOat: Apk case.\n");
 inline const Json kLibrariesStart = Log(4, "VeltSignJni starts: 3.\n");
 inline const Json kFileStart = Log(4, "VeltSign starts: zip_fd = 3, fd = 3.\n");
@@ -80,7 +82,8 @@ inline Json CannotSign(int error) {
   return Log(6, "VELT can't sign a file (result=10000, errno " + std::to_string(error) + ": x).\n");
 }
 
-// The facts of a package with these libraries. `error` is the errno of opening each library, or 0.
+// The facts of a package with the libraries `entries`. `error` and `has_directory` are the
+// values of these fields of LibraryFacts, for every library.
 inline PackageFacts WithLibraries(const Lines& entries, int error = 0, bool has_directory = false) {
   PackageFacts facts;
   for (const std::string& name : entries) {

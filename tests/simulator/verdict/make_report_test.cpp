@@ -93,9 +93,10 @@ TEST(MakeReport, IntegrityValuesAreReadAsTheToolReadsThem) {
   EXPECT_EQ(reason(nullptr), "package refused integrity-missing");
 }
 
-// The report's payload and key are those that the kernel accepted for the package, or otherwise for
-// a library. If the kernel accepted none, the report has no payload, and its key is the one that
-// the tool's own code reads.
+// The report has the payload that the kernel accepted for the package. If the kernel accepted no
+// payload for the package, the report has the payload of the first library that the kernel signed.
+// The report's key is the key whose digest this payload contains. If the kernel signed nothing, the
+// report has no payload. Its key is then the key that the tool's own code reads.
 TEST(MakeReport, KeyIsTheOneThatTheKernelGot) {
   const std::string own(64, 'a'), other(64, 'b');
   PackageFacts facts = WithLibraries({"lib/arm64-v8a/libfoo.so"});

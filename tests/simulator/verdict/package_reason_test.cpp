@@ -8,8 +8,8 @@ using namespace simulator;
 
 namespace {
 
-// The record of a run with these errors. Each error gets a line end, unless the tool logs it
-// without one.
+// The record of a run with these errors. Each error gets a line end, unless the tool logs this
+// error without a line end.
 RunRecord After(const Lines& errors) {
   RunRecord run;
   for (const std::string& error : errors) {
@@ -125,7 +125,8 @@ TEST(WhyRefused, ExplainsARefusedCertificate) {
   facts.jar.certificate->is_self_issued = false;
   facts.jar.certificate->issuer = "CN=Authority";
   EXPECT_EQ(Why(errors, facts), "certificate-issued CN=Authority");
-  // The largest and the smallest key that the tool accepts, in bytes, and the sizes next to them.
+  // The sizes in bytes of the largest key that the tool accepts, of a key that is too large, of the
+  // smallest key that the tool accepts, and of a key that is too small.
   const auto of_size = [&](uint32_t size) {
     facts.jar.key->size = size;
     facts.jar.key->bits = static_cast<int>(size) * 8 - 1;
@@ -149,8 +150,8 @@ TEST(WhyRefused, ExplainsARefusedSignature) {
   facts.jar.block.digest = "SHA512";
   facts.jar.block.has_known_digest = false;
   EXPECT_EQ(Why(errors, facts), "signature-digest SHA512");
-  // If the block could not be read to its last signer, its digest algorithm does not count as
-  // unknown.
+  // If the block could not be read to its last signer, the reason is not an unknown digest
+  // algorithm.
   facts.jar.block.is_whole = false;
   EXPECT_EQ(Why(errors, facts), "signature-wrong META-INF/CERT.RSA");
   facts.jar.block.has_pss = true;

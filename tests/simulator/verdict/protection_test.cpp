@@ -125,7 +125,8 @@ TEST(Chain, BreaksAtALibraryUnlessThePackageDoesBefore) {
             "x----");
 }
 
-// A failure of the run does not concern the signature.
+// The item `tool` reports a failure of the tool's run. Only the items of the package and of the
+// libraries can break a link.
 TEST(Chain, IsNotBrokenByAnotherItem) {
   const Item tool = {ItemKind::kTool, "tool", "", ItemState::kRefused, {&cause::kToolError, "x"}};
   EXPECT_EQ(ChainOf({PackageItem(nullptr), tool}), "hhhhh");

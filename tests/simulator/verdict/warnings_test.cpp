@@ -143,15 +143,17 @@ TEST(Warnings, OtherKeyOfAnyNewerSignerIsReported) {
   EXPECT_EQ(Warnings(facts), Lines({"other-key: the v2 " + told, "other-key: the v3 " + told}));
 }
 
-// The key of a v2 or v3 signer must have the modulus that the kernel gets. It must also be the key
-// in the JAR signer's certificate. Otherwise the warning other-key reports it.
+// The key of a v2 or v3 signer must have the modulus that the kernel gets. This key must also be
+// the key in the JAR signer's certificate. If one of these conditions fails, the warning other-key
+// reports the signer.
 TEST(Warnings, KeyThatMatchesOnlyInPartIsReported) {
   PackageFacts facts = Good();
   facts.newer = {{"v2", CertificateWith("CN=other", kModulus, "other key")}};
   EXPECT_EQ(Warnings(facts).size(), 1U);
   facts.newer = {{"v2", CertificateWith("CN=other", kOther, "jar key")}};
   EXPECT_EQ(Warnings(facts).size(), 1U);
-  // Without a readable certificate, only the key that the kernel got can be compared.
+  // Without a readable certificate, only the key that the kernel got can be compared. The missing
+  // certificate causes one more warning, block-ambiguous.
   facts.jar.certificate.reset();
   facts.newer = {{"v2", CertificateWith("CN=other", kOther, "jar key")}};
   EXPECT_EQ(Warnings(facts).size(), 2U);
@@ -205,7 +207,7 @@ TEST(Warnings, UnlistedAndDamagedEntriesAreReported) {
   facts.entries.push_back({{"lost", 1000, true}, false, false});
   EXPECT_EQ(Warnings(facts),
             Lines({"entries-damaged: 1 entry: lost", "unlisted-entries: 2 entries (1100 bytes)"}));
-  // Without a manifest, the listed entries are not known.
+  // Without META-INF/MANIFEST.MF, it is not known which entries are listed.
   facts.jar.manifest = Archive::ReadResult::kMissing;
   EXPECT_EQ(Warnings(facts), Lines({"entries-damaged: 1 entry: lost"}));
   facts.entries = {{{"added", 1, false}, false, false}};
@@ -213,7 +215,8 @@ TEST(Warnings, UnlistedAndDamagedEntriesAreReported) {
   EXPECT_EQ(Warnings(facts), Lines({"unlisted-entries: 1 entry (1 byte)"}));
 }
 
-// A package is laid out if its libraries are extracted beside it, as an installer does.
+// The simulator lays out a package: it extracts the libraries beside the package, as an installer
+// does. `not_laid_out` has the library entries whose names no installer accepts.
 TEST(Warnings, EntriesThatAreNotLaidOutAreReported) {
   RunRecord run;
   run.not_laid_out = {"lib/a.so"};

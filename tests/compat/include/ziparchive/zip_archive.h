@@ -12,7 +12,7 @@
 #include <cstddef>
 #include <cstdint>
 
-// `name` is not NUL-terminated.
+// `name` need not end with a NUL.
 struct ZipString {
   const uint8_t* name;
   uint16_t name_length;
