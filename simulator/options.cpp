@@ -351,7 +351,8 @@ std::optional<int> NameUnknownOption(const CLI::App& app) {
 }
 
 int MissFile() {
-  std::cerr << "FILE is required, or --files-from\nRun with --help for more information.\n";
+  std::cerr << "name at least one FILE, or use --files-from LIST\nRun with --help for more "
+               "information.\n";
   return kUsageError;
 }
 

@@ -67,9 +67,9 @@ const char* Describe(SignOutcome outcome) {
     case SignOutcome::kNotTrusted:
       return "not trusted: see the log of apktoolkit, or check that apktoolkit-verify runs";
     case SignOutcome::kTimedOut:
-      return "not trusted: apktoolkit took too long and was killed";
+      return "not trusted: apktoolkit or apktoolkit-bound took too long and was killed";
     case SignOutcome::kOutOfMemory:
-      return "not trusted: apktoolkit ran out of memory";
+      return "not trusted: apktoolkit or apktoolkit-bound ran out of memory";
     case SignOutcome::kCannotBeRun:
       return "not trusted: apktoolkit or apktoolkit-bound cannot be started";
   }

@@ -75,7 +75,10 @@ int main(int argc, char* argv[]) {
   const char* const file = argv[argc - 1];
   const std::string signer = JarSigner(file);
   if (signer.empty()) {
-    fprintf(stderr, "apktoolkit-bound: %s has no good JAR signature\n", file);
+    fprintf(
+        stderr,
+        "apktoolkit-bound: %s cannot be opened, is not a package, or has no good JAR signature\n",
+        file);
     return kNoJarSigner;
   }
   if (!IsAmong(argv[1], signer)) {

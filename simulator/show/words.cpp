@@ -129,7 +129,7 @@ std::string OutcomeOf(const Item& item, Verdict verdict) {
   std::string reason = item.reason.Text();
   if (item.state == ItemState::kDone) {
     if (item.kind == ItemKind::kPackage) return "signed with the payload of the signer's key";
-    if (item.kind == ItemKind::kJar) return "signed, without data";
+    if (item.kind == ItemKind::kJar) return "signed, with an empty payload";
     if (item.kind == ItemKind::kKey) return "registered for " + item.name;
     return "signed";
   }

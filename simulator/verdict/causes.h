@@ -338,8 +338,8 @@ inline constexpr Cause kLibraryInPackage = {"library-in-package", Group::kLibrar
     "Nothing to do: it is loaded from the package."};
 inline constexpr Cause kLibraryNotInstalled = {"library-not-installed", Group::kLibrary,
     Severity::kAbsent, ChainLink::kNone, "`Can't open file`",
-    "no libraries for its processor are beside the package", "If the phone has another processor, "
-    "there is nothing to do. To extract the libraries of all processors, use --install=all."};
+    "no libraries for its ABI are beside the package", "If the phone uses another ABI, "
+    "there is nothing to do. To extract libraries for 32-bit and 64-bit Arm, use --install=all."};
 inline constexpr Cause kLibraryNotLaidOut = {"library-not-laid-out", Group::kLibrary,
     Severity::kNothing, ChainLink::kNone, "`Can't open file`",
     "its ABI was not chosen (--install=all chooses one for 32-bit and one for 64-bit Arm)",
@@ -394,8 +394,8 @@ inline constexpr Cause kNotInstallable = {"not-installable", Group::kInstaller, 
     "trust it. apksigner verify --min-sdk-version 27 names every fault."};
 inline constexpr Cause kNotInstallableOnSome = {"not-installable-on-some", Group::kInstaller,
     Severity::kRefused, ChainLink::kNone, "", "phones of %s",
-    "Sign it so that all of these phones install it, as apksigner does by default. If it is only "
-    "for some of them, name those with --api."};
+    "Sign it so that all of these phones install it, as apksigner does by default. If the "
+    "package is only for some of these phones, name their API levels with --api."};
 inline constexpr Cause kInstallerGaveUp = {"installer-gave-up", Group::kInstaller,
     Severity::kRefused, ChainLink::kNone, "", "the installer's verifier gave up: %s", "If you "
     "did not build this package, do not trust it. A large package may need a larger --timeout; "
@@ -461,8 +461,8 @@ inline constexpr Cause kDebugKey = {"debug-key", Group::kWarning, Severity::kWar
     "workstation makes its own debug key", "Sign a release with a release key."};
 inline constexpr Cause kWeakDigest = {"weak-digest", Group::kWarning, Severity::kWarning,
     ChainLink::kNone, "", "SHA-1 or MD5 is in use: %s",
-    "Sign it again with SHA-256: apksigner does so with --min-sdk-version 18. Certify the key of "
-    "a new app with SHA-256 as well; for a published app, a new certificate makes another signer."};
+    "Sign it again with SHA-256 (apksigner --min-sdk-version 18). Certify the key of a new app "
+    "with SHA-256 as well; for a published app, a new certificate makes another signer."};
 inline constexpr Cause kCertificateExpired = {"certificate-expired", Group::kWarning,
     Severity::kWarning, ChainLink::kNone, "", "its certificate expired on %s",
     "Phones still install it. A published app must keep its certificate: a new one makes another "

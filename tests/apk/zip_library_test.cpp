@@ -15,9 +15,7 @@ struct OlderName {
   const uint8_t* name;
   uint16_t name_length;
   OlderName() {}
-  explicit OlderName(const char*) {
-    ADD_FAILURE() << "the constructor from a C string is not used";
-  }
+  explicit OlderName(const char*) { ADD_FAILURE() << "the constructor from a C string was called"; }
 };
 
 OlderName Older(const std::string& text) {

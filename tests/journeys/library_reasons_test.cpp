@@ -73,15 +73,13 @@ TEST_F(Reason, StrictRefusesALibraryThatNoInstallerExtracts) {
 TEST_F(Reason, LibrariesMissingBesideThePackageAreReported) {
   Take("apksigner-sha256-2048");
   Do("rm -r lib");
-  const std::string absent =
-      "nothing to sign: no libraries for its processor are beside the package";
-  EXPECT_EQ(
-      Told(7),
-      Lines({"SIGNED  base.apk" + ByRsa2048(), kSigned, "  – lib/arm64/libvault.so  " + absent,
-             "  – lib/arm/libvault.so    " + absent,
-             "      If the phone has another processor, there is nothing to do. To extract the",
-             "      libraries of all processors, use --install=all.",
-             "  ✓ key                    registered for com.example.vault", "-> 0"}));
+  const std::string absent = "nothing to sign: no libraries for its ABI are beside the package";
+  EXPECT_EQ(Told(7),
+            Lines({"SIGNED  base.apk" + ByRsa2048(), kSigned,
+                   "  – lib/arm64/libvault.so  " + absent, "  – lib/arm/libvault.so    " + absent,
+                   "      If the phone uses another ABI, there is nothing to do. To extract",
+                   "      libraries for 32-bit and 64-bit Arm, use --install=all.",
+                   "  ✓ key                    registered for com.example.vault", "-> 0"}));
   EXPECT_EQ(Told(1, {"--strict"}), Lines({"PARTLY SIGNED  base.apk", "-> 1"}));
   EXPECT_EQ(Told(5, {"--install=all"}),
             Lines({"SIGNED  base.apk" + ByRsa2048(), kSigned, "  ✓ lib/arm64/libvault.so  signed",
@@ -118,13 +116,13 @@ TEST_F(Reason, PackageWithoutLibrariesBesideItIsLaidOut) {
   EXPECT_EQ(run().output, alone.output);
 }
 
-TEST_F(Reason, MissingLibraryOfOneProcessorIsReported) {
+TEST_F(Reason, MissingLibraryOfOneAbiIsReported) {
   Take("apksigner-sha256-2048");
   Do("rm -r lib/arm");
   EXPECT_EQ(Told(4)[2], "  ✓ lib/arm64/libvault.so  signed");
   EXPECT_EQ(Told(4)[3],
-            "  – lib/arm/libvault.so    nothing to sign: no libraries for its processor are beside "
-            "the package");
+            "  – lib/arm/libvault.so    nothing to sign: no libraries for its ABI are beside the "
+            "package");
 }
 
 TEST_F(Reason, LibrariesKeptInsideThePackageAreReported) {

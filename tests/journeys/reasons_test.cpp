@@ -393,7 +393,7 @@ TEST_F(Reason, PlainJarIsSignedOnlyIfTrusted) {
                    "already trusts it (ENOKEY: Required key not available)",
                    "-> 1"}));
   EXPECT_EQ(Told(2, {"--trust", "library.jar"}, "library.jar"),
-            Lines({"TRUSTED JAR  library.jar", "  ✓ JAR  signed, without data", "-> 0"}));
+            Lines({"TRUSTED JAR  library.jar", "  ✓ JAR  signed, with an empty payload", "-> 0"}));
 }
 
 }  // namespace

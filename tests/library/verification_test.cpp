@@ -134,7 +134,7 @@ TEST(VerificationReason, SaysWhichStepOfTheVerificationFails) {
   certificate.public_key_info =
       PublicKeyInfoAround(der::Sequence({der::Integer(Bytes(256, 0x55)), der::Integer(Bytes{1})}));
   block.certificates = certificate.Build();
-  EXPECT_EQ(ReasonOf(block), Reason::kKeyRefused) << "the exponent 1 makes no signature";
+  EXPECT_EQ(ReasonOf(block), Reason::kKeyRefused) << "anyone can sign with the exponent 1";
   block = {};
   block.issuer_key = "rsa-2048-other";
   EXPECT_EQ(ReasonOf(block), Reason::kCertificateRefused);

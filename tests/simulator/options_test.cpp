@@ -125,7 +125,7 @@ TEST(Options, FilesComeFromTheCommandLineOrAList) {
 }
 
 TEST(Options, MissingFileArgumentIsReported) {
-  EXPECT_EQ(LinesOf(Told({}).errors)[0], "FILE is required, or --files-from");
+  EXPECT_EQ(LinesOf(Told({}).errors)[0], "name at least one FILE, or use --files-from LIST");
 }
 
 TEST(Options, InstallerIsAutoForApi27AndLaterByDefault) {

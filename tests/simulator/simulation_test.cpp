@@ -221,7 +221,7 @@ TEST(Simulation, WorksFromADirectoryWithASpaceAndAColon) {
                                            "--tool", place + "/bin/simulator_probe", probe.path()});
   EXPECT_EQ(result.status, 0) << result.errors;
   EXPECT_EQ(FirstLines(result, 3),
-            Lines({"TRUSTED JAR  " + probe.path(), "  + JAR  signed, without data",
+            Lines({"TRUSTED JAR  " + probe.path(), "  + JAR  signed, with an empty payload",
                    "  + key  registered for name"}));
 }
 

@@ -31,7 +31,7 @@ Bytes WithForgedBlock(const Bytes& exponent) {
 // tool reads the missing bytes as 0. Bytes 5 to 8 of a longer exponent overwrite the length of the
 // modulus. These bytes agree with 00 01 00 00, which is 256 in host byte order, so that the length
 // does not change.
-TEST(Threat, ExponentOfOneOrMinusOneIsRefusedInEveryForm) {
+TEST(Threat, ExponentReadAsOneOrMinusOneIsRefused) {
   for (const char* exponent :
        {"01", "01 00", "01 00 00", "01 00 00 00", "FF FF FF FF", "01 00 00 00 00 01",
         "01 00 00 00 00 01 00", "01 00 00 00 00 01 00 00", "01 00 00 00 00 01 00 00 AA BB",

@@ -408,8 +408,8 @@ TEST(Page, KeepsOptionsOnOneLine) {
   report.items = {Library("a", &cause::kLibraryNotInstalled)};
   report.items[0].state = ItemState::kAbsent;
   EXPECT_TRUE(Has(PageOf(report),
-                  "<p class=\"cure\">If the phone has another processor, there is nothing to "
-                  "do. To extract the libraries of all processors, use <span "
+                  "<p class=\"cure\">If the phone uses another ABI, there is nothing to do. To "
+                  "extract libraries for 32-bit and 64-bit Arm, use <span "
                   "class=\"option\">--install=all</span>.</p>"));
   EXPECT_TRUE(Has(PageOf(report), ".option { white-space: nowrap; }"));
 }
