@@ -33,10 +33,10 @@ uint16_t FirstUnit(Text text);
 }  // namespace
 
 bool Apk::ParseAndroidManifest(std::vector<uint8_t> bytes) {
-  // The platform's parser does not check that a whole chunk header or attribute is there before it
-  // reads one. The buffer is therefore longer than the document, by the size of an attribute, which
-  // is larger than a chunk header. A document that is shorter than a chunk header is passed with
-  // size 0, which the parser refuses.
+  // The platform's parser can read a chunk header or an attribute that ends beyond the document.
+  // The buffer is therefore longer than the document by the size of an attribute. A chunk header is
+  // smaller than an attribute. If the document is shorter than a chunk header, the parser gets the
+  // size 0 and refuses the document.
   const size_t size = bytes.size(), room = size + sizeof(android::ResXMLTree_attribute);
   bytes.reserve(room);
   bytes.resize(room);

@@ -37,7 +37,7 @@ void EntryDigests::List() {
   bool in_order = true;
   for (uint32_t i = 0; i < sections.size(); ++i) {
     const std::string_view name = NameOf(i);
-    // The main section is also left out, because it normally has no name.
+    // Sections without a name are left out. The main section normally has no name.
     if (name.empty() || DigestOf(sections[i]).first.empty()) continue;
     in_order = in_order && last <= name;
     last = name;

@@ -1,8 +1,8 @@
 // apk/android_manifest.cpp: any bytes as the compiled Android manifest. The sanitizers do not check
-// the platform's parser. The tool's buffer for the bytes therefore ends right before memory that
-// cannot be read. The tool compares texts without conversion. A second reader, in this file,
-// converts texts to UTF-8 before it compares them. Both readers must find the same facts. A
-// document with an element of more than 1000 attributes is not compared.
+// the platform's parser. The tool's buffer for the bytes is therefore put before a page that cannot
+// be read (support/memory_end.h). The tool compares texts without conversion. A second reader, in
+// this file, converts texts to UTF-8 before it compares them. Both readers must find the same
+// facts. A document with an element of more than 1000 attributes is not compared.
 #include <androidfw/ResourceTypes.h>
 #include <utils/String8.h>
 

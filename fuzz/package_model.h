@@ -1,8 +1,9 @@
 // A model of the tool's decisions. The fuzz target for packages compares the tool's actions with
 // the model. The model reads the archive through the platform's zip library, as the tool does. It
-// reads texts with models.h, and checks signatures and digests with libcrypto. The tool's own code
-// finds two facts: the fields of the signature block (processCert), and the path at which a library
-// is installed. tests/crypto/pkcs7_test.cpp and tests/apk/native_libraries_test.cpp test this code.
+// reads the manifest and the signature file with models.h, and checks signatures and digests with
+// libcrypto. The tool's own code finds two facts: the fields of the signature block (processCert),
+// and the path at which a library is installed. tests/crypto/pkcs7_test.cpp and
+// tests/apk/native_libraries_test.cpp test this code.
 #pragma once
 
 #include <map>
@@ -19,12 +20,15 @@ class PackageModel {
 
   // True if "AndroidManifest.xml" can be extracted from the archive.
   bool is_package() const { return is_package_; }
-  // True if the package is signed with the key that key() returns, its manifest and classes.dex (if
-  // there is one) have the signed digests, and "AndroidManifest.xml" is compiled XML.
+  // True if these four conditions are true:
+  //   - The package is signed with the key that key() returns.
+  //   - META-INF/MANIFEST.MF has the digest that the signature file states.
+  //   - "AndroidManifest.xml" is compiled XML.
+  //   - classes.dex is missing, or has the digest that META-INF/MANIFEST.MF states.
   bool is_good() const { return is_good_; }
   const Bytes& key() const { return key_; }
-  // True if one of the archive's libraries is installed at `path`, for a package in `directory`
-  // (with its "/"), and the manifest lists it with the digest of `content`.
+  // `directory` is the directory of the package, with "/" at its end. True if one of the archive's
+  // libraries belongs at `path`, and the manifest lists this library with the digest of `content`.
   bool AllowsLibrary(const std::string& directory, const std::string& path,
                      const Bytes& content) const;
 
@@ -52,5 +56,5 @@ class PackageModel {
 // The sum of the sizes that the archive's entries declare. "AndroidManifest.xml" counts 128 times,
 // because the platform's library can use far more memory than this entry has bytes. An entry is
 // left out if deflate cannot make the declared size from the entry's data: the tool does not
-// extract it.
+// extract such an entry.
 size_t DeclaredBytes(const Bytes& archive);

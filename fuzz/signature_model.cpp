@@ -15,7 +15,8 @@ Bytes Copy(const uint8_t* place, size_t length, const Bytes& block) {
   return Bytes(place, place + length);
 }
 
-// The fields as RFC 2315 section 9 and RFC 5280 section 4.1 place them.
+// The fields of a signature block that ReadStrictly finds. RFC 2315 section 9 and RFC 5280
+// section 4.1 define their order.
 struct StrictBlock {
   CBS tbs;  // header included
   CBS modulus, exponent, certificate_signature, encrypted_digest;
@@ -102,17 +103,17 @@ void CompareWithStrictReader(const pkcs7& record, const Bytes& block) {
   StrictBlock strict;
   if (!ReadStrictly(block, &strict)) return;
   Require(Same(strict.tbs, record.tbs_data, record.tbs_data_length),
-          "both readers find the same signed part of the certificate");
+          "the tool and the strict reader find the same signed part of the certificate");
   Require(Same(strict.certificate_signature, record.cert_signature, record.cert_signature_length),
-          "both readers find the same signature of the certificate");
+          "the tool and the strict reader find the same signature of the certificate");
   Require(Same(strict.encrypted_digest, record.signed_digest, record.signed_digest_length),
-          "both readers find the same signature in the SignerInfo");
+          "the tool and the strict reader find the same signature in the SignerInfo");
   if (CBS_len(&strict.exponent) > sizeof(record.exponent)) return;
   Require(std::equal(CBS_data(&strict.exponent),
                      CBS_data(&strict.exponent) + CBS_len(&strict.exponent), record.exponent),
-          "both readers find the same exponent");
+          "the tool and the strict reader find the same exponent");
   if (CBS_len(&strict.modulus) > 0 && CBS_data(&strict.modulus)[0] == 0)
     CBS_skip(&strict.modulus, 1);
   Require(Same(strict.modulus, record.modulus, record.modulus_length),
-          "both readers find the same modulus");
+          "the tool and the strict reader find the same modulus");
 }

@@ -1,6 +1,7 @@
 // Runs three steps on one file: signs its native libraries, signs the file itself, and registers
-// its signer. main prints nothing. The exit status is 1 for a usage error and 0 for everything
-// else. Only the Android log reports what was signed and what was refused.
+// its signer. main returns 1 for a usage error, and else 0. Only the Android log reports what was
+// signed and what was refused. Of the tool's code, only crypto/pkcs7.cpp prints: the faults of a
+// signature block, to standard output.
 #include <sys/statvfs.h>
 #include <unistd.h>
 

@@ -28,7 +28,7 @@ int OpenForReading(const char* path, int flags);
 //     "Can't read file: %s (streamoff=%zd)\n" with -1 for the size.
 // Returns true even if fewer bytes can be read than the file's size. The rest of `out` then keeps
 // its old bytes. Bytes that `out` did not have before are 0. If `out` is empty and its memory is
-// too small, this memory is freed first. Growing then copies nothing and never needs two buffers.
+// too small, this memory is freed before the new memory is allocated.
 bool ReadFile(const std::string& path, std::vector<uint8_t>& out, struct stat* state = nullptr,
               int fd = -1);
 

@@ -11,8 +11,9 @@
  *   /proc/PID/integrity/value  the integrity value of a task, in hexadecimal
  *
  * The kernel itself is not changed. Kprobes redirect these two commands, and the look-up of
- * "integrity" below /proc/PID, to the functions below; everything else works as before. The module
- * cannot be unloaded, because /proc keeps inodes whose operations are in the module.
+ * "integrity" in /proc/PID, to functions of this file. All other calls work as before. The module
+ * has no exit function, so it cannot be unloaded: /proc keeps inodes whose operations are in the
+ * module.
  */
 #include <crypto/sha2.h>
 #include <linux/file.h>
@@ -85,7 +86,7 @@ static struct signature *copy_payload(const u8 __user *payload)
 	return ERR_PTR(-EFAULT);
 }
 
-/* A product must prevent later changes of the file. This module does not. */
+/* A product must prevent changes of a signed file. This module does not. */
 static int digest_file(struct file *file, u8 digest[SHA256_DIGEST_SIZE])
 {
 	struct sha256_state state;

@@ -16,13 +16,13 @@
 
 namespace simulator {
 
-// kAuto: if the verifier is installed, the installer is asked. kRequired: without the verifier, the
-// run fails. kOff: the installer is never asked.
+// kAuto: Judge asks the installer if Missing() returns none. kRequired: the run also fails if
+// Missing() returns a text. kOff: Judge never asks the installer.
 enum class InstallerUse { kAuto, kRequired, kOff };
 
 struct InstallerOptions {
   InstallerUse use = InstallerUse::kAuto;
-  LevelRange levels = {27, kNewestLevel};  // the phones whose installer is asked
+  LevelRange levels = {27, kNewestLevel};  // of the phones whose installer is asked
   double timeout = 30;                     // seconds, for each file
   std::string program;                     // the path of the JAR with InstallerVerifier
 };

@@ -1,5 +1,5 @@
-// Untrusted bytes as input for CBS, libcrypto's reader. CBS never reads beyond the end of the
-// bytes.
+// Converts untrusted bytes to a CBS, libcrypto's reader, and a CBS back to bytes. A CBS never reads
+// beyond the end of its bytes.
 #pragma once
 
 #include <openssl/bytestring.h>

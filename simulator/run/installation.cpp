@@ -101,8 +101,8 @@ std::optional<std::string> Installation::LayOut(const std::string& file, Install
   return {};
 }
 
-// Replaces the directory's name wherever it occurs. The name is random, so the package's own names
-// cannot contain it.
+// Replaces the temporary directory's path wherever the journal contains it. mkdtemp makes the end
+// of this path random, so the author of a package cannot put the path into a name.
 std::string Installation::WithStablePaths(const std::string& journal) const {
   if (directory_.empty()) return journal;
   const std::string quoted = EncodeText(directory_ + "/");
@@ -151,9 +151,9 @@ bool LiesAlone(int package, const std::vector<std::string>& libraries) {
   });
 }
 
-// `choice` decides whether the libraries for 64-bit Arm, for 32-bit Arm or for both are extracted.
-// For each of these two processors, an installer uses only one ABI: the first in kPhoneAbis for
-// which the package has libraries.
+// `choice` selects the processors (InstalledAbi): 64-bit Arm, 32-bit Arm or both. For each selected
+// processor, an installer uses only one ABI: the first in kPhoneAbis for which the package has
+// libraries.
 Layout PlanLayout(const std::vector<std::string>& entries, InstalledAbi choice,
                   std::vector<std::string>* left_out, std::set<std::string>* of_other_processors) {
   Layout layout;
@@ -181,8 +181,9 @@ Layout PlanLayout(const std::vector<std::string>& entries, InstalledAbi choice,
   return layout;
 }
 
-// True for lib/ABI/FILE, if an installer accepts the name FILE. FILE cannot lead out of the
-// directory of its ABI: it contains no "/", and it is not "." or ".." because it ends with ".so".
+// `entry` must be a name from LibraryNames. Returns true if `entry` is lib/ABI/FILE and an
+// installer accepts the name FILE. FILE then cannot lead out of the directory of its ABI: FILE
+// contains no "/", and it is not "." or ".." because it ends with ".so".
 bool IsNameForInstallers(const std::string& entry) {
   const size_t slash = entry.find('/', strlen(kLibraryNames.prefix));
   return slash != std::string::npos && entry.find('/', slash + 1) == std::string::npos &&
@@ -213,7 +214,8 @@ bool PutPackage(const std::string& file, int source, const std::string& copy,
   return size == 0;
 }
 
-// Returns 0, the errno of a failure to write the file, or -1 if the entry cannot be extracted.
+// Returns 0, the errno of a failure to create or write the file, or -1 if the entry cannot be
+// extracted.
 int Extract(const Archive& archive, const std::string& entry, const std::string& path,
             const Deadline& deadline) {
   constexpr mode_t kMode = 0755;

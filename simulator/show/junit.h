@@ -1,6 +1,7 @@
 // The report of a run for programs that read test results: one JUnit document with a test case for
-// each file. A refused file is a failure. A file that the tool did not look at, or whose run could
-// not be simulated, is an error. No case is ever skipped. All texts from a file are escaped.
+// each file. A file with the exit status kSomeRefused (exit_status.h) is a failure. A file that the
+// tool did not look at, or whose run could not be simulated, is an error. No case is ever skipped.
+// All texts from a file are escaped.
 #pragma once
 
 #include <string>
@@ -29,8 +30,8 @@ class Junit {
   struct Case {
     std::string name;
     Outcome outcome;
-    std::string type;     // the reason's code; without a reason, the verdict's code
-    std::string message;  // the verdict and the reason in words
+    std::string type;     // the reason's code; without a reason, the verdict's; empty if passed
+    std::string message;  // the verdict and the reason in words; empty if passed
     std::string text;     // what was refused, each warning, and what to do
   };
 

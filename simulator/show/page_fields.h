@@ -11,8 +11,8 @@
 
 namespace simulator {
 
-// At most this many lines of each kind are shown for a file. The rest are only counted. If items
-// are left out, the refused ones are shown first.
+// At most this many lines of each list are shown for a file. The other lines are only counted. If
+// a report has more items than this, the refused items are shown first.
 inline constexpr size_t kMostPageLines = 200;
 // At most this many bytes of a text from a file are shown, with "…" for the rest. Bytes are counted
 // before the text is escaped.
@@ -30,16 +30,18 @@ std::string Short(std::string_view bytes, size_t most = kMostPageText);
 Reason Short(Reason reason);
 Item Short(Item item);
 
-// A section of the template without fields. It is shown if `condition` is true.
+// The value of a section of the template. The section is shown once if `condition` is true, and
+// otherwise not at all.
 kainjow::mustache::list OneIf(bool condition);
 
 // The number in groups of three digits, such as "1,234,567".
 std::string Grouped(uint64_t number);
 
-// Sets the sections of a list, where NAME is `name`: "NAME_shown" if there are lines, "NAME" with
-// the fields that `make` returns for each of the first kMostPageLines lines, and "NAME_more" if
-// there are more lines. Sets "NAME_count" to the number of all lines. `remark` follows the number
-// of lines that are left out.
+// Sets the fields of `file` that show a list of lines. NAME is the value of `name`:
+//   NAME_shown  a section that is shown if there are lines
+//   NAME        the fields that `make` returns, for each of the first kMostPageLines lines
+//   NAME_count  the number of all lines
+//   NAME_more   a section that is shown if lines are left out: their number, and then `remark`
 template <typename Lines, typename Make>
 void AddLines(const std::string& name, const Lines& lines, const std::string& remark, Make make,
               kainjow::mustache::data* file) {

@@ -33,9 +33,10 @@ class Presenter {
   Presenter(const ShowOptions& options, size_t file_count);
 
   // Returns a reason not to begin if OutputFile::Objection has one for an output, or if two outputs
-  // are the same file. Else none.
+  // are the same file. Otherwise returns none.
   std::optional<std::string> Objection(const std::vector<std::string>& inputs) const;
-  // Opens the outputs. Returns none, or why one of them cannot be written: then call GiveUp.
+  // Opens the outputs. If an output cannot be written, returns the reason, and the caller must call
+  // GiveUp. Otherwise returns none.
   std::optional<std::string> Begin();
   // `journal`: the lines of the run, without the verdict.
   void Show(const Report& report, const std::string& journal);

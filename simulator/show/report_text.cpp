@@ -142,7 +142,7 @@ void Printer::PrintChain() {
   }
 }
 
-// Prints the cure, wrapped, below the line to which it belongs.
+// Prints the cure, wrapped. Call PrintCure directly after printing the line of the item or warning.
 void Printer::PrintCure(const Cause& cause) {
   const std::string margin(6, ' ');
   const std::string text = cause.cure;

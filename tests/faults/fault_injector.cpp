@@ -48,9 +48,9 @@ bool IsIn(const char* name, const void* address) {
          strstr(info.dli_fname, name) != nullptr;
 }
 
-// If memory is missing, the platform's String8 crashes on a null pointer, while the platform's
-// other containers abort. This handler turns that crash into an abort, so that a test can
-// distinguish this crash from other crashes.
+// If an allocation fails, the platform's String8 crashes on a null pointer, while the platform's
+// other containers abort. The code of String8 is in libutils.so. This handler turns a crash in
+// libutils.so into an abort, so that a test can distinguish this crash from crashes in other code.
 void AbortForString8(int, siginfo_t*, void* context) {
 #ifdef __x86_64__
   const auto address = static_cast<ucontext_t*>(context)->uc_mcontext.gregs[REG_RIP];
@@ -92,7 +92,7 @@ Main* real_main = nullptr;
 int ArmAndStart(int argc, char** argv, char** environment) {
   Arm();
   const int status = real_main(argc, argv, environment);
-  calls_left = 0;  // later calls are not the tool's
+  calls_left = 0;  // calls after main() do not fail
   return status;
 }
 

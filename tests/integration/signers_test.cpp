@@ -1,6 +1,6 @@
-// Tests how the signers of a package are compared. The Java side finds the package manager's
-// signers. The C++ side (apktoolkit-bound) checks that the JAR signer, which apktoolkit uses, is
-// one of them.
+// Tests how the signers of a package are compared. The Java side (SignerDigests.java) lists the
+// signers that the package manager knows. The C++ side (apktoolkit-bound) checks that the JAR
+// signer, which apktoolkit uses, is in this list.
 #include <gtest/gtest.h>
 
 #include <filesystem>
@@ -17,11 +17,12 @@ namespace {
 namespace fs = std::filesystem;
 using Words = std::vector<std::string>;
 
-// The path of `name` in the directory of golden packages. tests/journeys/make_golden_packages signs
-// these packages with real signing tools.
+// The path of `name` in the directory of golden packages. tests/journeys/make_golden_packages makes
+// these packages, most of them with real signing tools.
 std::string Golden(const std::string& name) { return std::string(GOLDEN_PACKAGES) + "/" + name; }
 
-// The digest of the key's modulus, which make_golden_packages computed with openssl.
+// The SHA-256 digest of the modulus of the golden package's signer. make_golden_packages computed
+// this digest with openssl.
 std::string DigestOfKey(const std::string& golden) {
   return ContentOf(Golden(golden) + "/digest").substr(0, 64);
 }

@@ -110,9 +110,8 @@ TEST(PackageEntries, LibraryChangedInsideThePackageIsNotBlamedOnTheInstallation)
   EXPECT_EQ(event["entries"]["differing"]["looked_at"], 1);
 }
 
-// The verifier reports a wrong length of an entry as an error of the package, and does not give up.
-// The length is in the entry's local header and in its central directory header, so both are
-// changed.
+// The verifier reports the wrong length of META-INF/CERT.SF as an error of the package. The length
+// is in the local header and in the central directory header of the entry. The test changes both.
 TEST(Installer, RefusesAnEntryThatIsLongerThanItClaims) {
   const TempDir directory;
   const ProcessResult made = RunProcess({"bash", "-e", "-c", R"(cp -r "$0"/* .
@@ -168,7 +167,7 @@ TEST(Installer, RefusesAPackageThatNeedsNewerPhones) {
 }
 
 TEST(Installer, OtherSignerIsShownInTheVerdict) {
-  // Newer versions of apksigner write v3.1 for a rotated key as well.
+  // For a rotated key, newer versions of apksigner write v3.1 in addition to v2 and v3.
   const std::string takers = "phones of API 27 and later install it, verified by v2, v3";
   Lines rotated = Told("rotated-key");
   ASSERT_EQ(rotated.size(), 3U);
@@ -182,13 +181,13 @@ TEST(Installer, OtherSignerIsShownInTheVerdict) {
             Lines({"SIGNED", "phones of API 27 install it, verified by v2", "-> 0"}));
 }
 
-// If the verifier is asked about all levels at once, it names one signer for all of them: the
-// signer with the first key. For a package with v3, the simulator therefore asks about ranges of
-// levels.
+// If the verifier is asked about all API levels at once, it gives one answer for all of them. For
+// this package, the answer would name the signer with the first key. The simulator therefore asks
+// about ranges of levels if a package has v3 or v3.1.
 TEST(Installer, SignerOnlyForLaterPhonesIsFound) {
   const Lines told = Told("later-v3");
   EXPECT_EQ(told.front(), "NOT INSTALLABLE");
-  // Versions of apksig give different reasons.
+  // The reason is not compared, because it depends on the version of apksig.
   EXPECT_EQ(told[1].substr(0, told[1].find(": ")),
             "phones of API 27, API 30 and later install it, but phones of API 28 to 29 refuse it");
   EXPECT_EQ(told.back(), "-> 1");
@@ -210,7 +209,8 @@ TEST(Installer, RefusesAV3SignerWithoutALineageFromTheV2Signer) {
             Lines({"SIGNED", "phones of API 27 install it, verified by v2", "-> 0"}));
 }
 
-// Older versions of apksig do not know v3.1, and would name the first key for all phones.
+// Older versions of apksig do not know v3.1, and would name the first key for all phones. With each
+// version, the simulator must not report SIGNED.
 TEST(Installer, SignerOfSchemeV31IsNotSkipped) {
   const ProcessResult run = RunProcess(
       {SimulatorPath(), "--quiet", "--installer=required", Golden("later-v31") + "/base.apk"});
@@ -280,8 +280,9 @@ with zipfile.ZipFile("base.apk", "a") as archive:
   EXPECT_EQ(run.output.substr(0, 17), "NOT INSTALLABLE  ") << run.output << run.errors;
 }
 
-// The verifier starts late, after the tool's run has ended. A file that changes in between has no
-// result. A new hard link to the file does not count as a change.
+// This test's `java` waits 0.5 s, so that the tool's run normally ends first. Then it changes the
+// file and starts the verifier. The verdict of a changed file is NOT SIMULATED. A new hard link to
+// the file does not count as a change.
 TEST(Installer, FileThatChangesBeforeItsAnswerHasNoResult) {
   const TempDir directory;
   const std::string apk = directory / "base.apk";

@@ -12,7 +12,7 @@ import sys
 from blueprint import Blueprint
 from sources import ROOMS, ROOT, report, tool_sources
 
-# Sources that need more than a phone has. Only the workstation's build has them.
+# Sources that only the workstation's build has, each with the reason.
 WORKSTATION_ONLY = {
     "tests/apk/manifest_mf_test.cpp": "runs the JDK",
     "tests/crypto/mpi_mod_mpi_test.cpp": "compares with GMP",
@@ -46,9 +46,9 @@ KNOWN_PROPERTIES = {"cflags", "compile_multilib", "cpp_std", "data", "defaults",
 PLATFORM_ONLY_FLAGS = {"-Wno-sign-conversion", "-Werror"}
 
 
-# For each blueprint (a file Android.bp or cc_fuzz.bp), the modules whose sources come from targets
-# of CMake, with these targets. A target is DIRECTORY:NAME, or NAME in the root. In a blueprint,
-# paths are relative to the blueprint's directory.
+# A blueprint is a file Android.bp or cc_fuzz.bp. For each blueprint: the modules whose sources come
+# from targets of CMake, with these targets. A target is DIRECTORY:NAME, or NAME for a target in the
+# root. In a blueprint, paths are relative to the blueprint's directory.
 MODULES = {
     "Android.bp": {"apktoolkit_core": ["apktoolkit_core"], "apktoolkit": ["apktoolkit"],
                    "apktoolkit-verify": ["apktoolkit-verify"],
@@ -83,7 +83,7 @@ def main():
 
 
 def with_sources(name, modules):
-    """The blueprint's text, with the sources of these modules as CMake has them."""
+    """The blueprint's text, with the correct sources of these modules."""
     path = ROOT / name
     text = path.read_text()
     for module, targets in modules.items():
@@ -95,7 +95,7 @@ def with_sources(name, modules):
         text, count = re.subn(rf'(name: "{module}",(?:(?!\n}}).)*?srcs: )\[[^]]*\]', rf"\g<1>{srcs}", text,
                               flags=re.S)
         if count != 1:
-            sys.exit(f"{path} has no module {module} with srcs: add one, with an empty list")
+            sys.exit(f"{path} has no module {module} with srcs: add the module, with the line `srcs: [],`")
     return text
 
 
@@ -138,7 +138,7 @@ def hold_words(platform, tests, problems):
 
 
 def cmake_sources(target):
-    """The sources of a target, DIRECTORY:NAME, or NAME in the root."""
+    """The sources of a target. `target` is DIRECTORY:NAME, or NAME for a target in the root."""
     directory, _, name = target.rpartition(":")
     path = ROOT / directory / "CMakeLists.txt"
     found = re.search(rf"(?:add_library|add_executable|apktoolkit_add_test)\({name}\s+([^)]*)\)",

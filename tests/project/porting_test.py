@@ -2,7 +2,8 @@
 """Compares docs/porting.md with the sources: the interface, the modules of the blueprint, the
 example of a JAR's key block, the links to the page's own headings, and the links to all directories
 of integration/. Also compares docs/porting.md and the tool's manual page with the directories of
-installed libraries in apk/native_libraries.h. With --write, writes these directories to both."""
+installed libraries in apk/native_libraries.h. With --write, writes these directories to
+docs/porting.md and the manual page."""
 
 import hashlib
 import re

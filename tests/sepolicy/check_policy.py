@@ -1,7 +1,8 @@
 #!/usr/bin/env python3
-"""Compiles integration/sepolicy for each API level in LEVELS. Files *.conf beside this script take
-the place of the platform's policy. The policy must grant exactly the permissions of GRANTED, and
-with libzu also those of GRANTED_WITH_ZU. The compilation must fail with each rule of REFUSED.
+"""Compiles integration/sepolicy for each API level in LEVELS. platform.conf, platform_end.conf and
+zu.conf take the place of the platform's policy. The policy must grant exactly the permissions of
+GRANTED, and with libzu also those of GRANTED_WITH_ZU. Permissions that the level does not know are
+left out. If a rule of REFUSED is added, a neverallow rule must make the compilation fail.
 
 file_contexts must be valid. Each installed program must match exactly one of its patterns, and each
 pattern must match a program. m4, checkpolicy, secilc and setfiles are Debian's.
@@ -17,8 +18,8 @@ HERE = pathlib.Path(__file__).resolve().parent
 KIT = HERE.parents[1] / "integration/sepolicy"
 ALLOW = re.compile(r"\(allow (\S+) (\S+) \((\S+) \(([^)]*)\)\)\)")
 
-# By API level: the product's definitions for m4, and the words that the policy of this level does
-# not know.
+# By API level: the product's definitions for m4, and the permissions and attributes that the
+# platform's policy of this level does not declare.
 LEVELS = {27: (["-Dapktoolkit_level=27"], {"map", "system_file_type"}),
           28: (["-Dapktoolkit_level=28"], {"system_file_type"}),
           29: ([], set()),
@@ -153,7 +154,7 @@ def check(directory, level):
     for rule in REFUSED:
         cil, complaint = compiled(directory, level, [tool], rule + "\n")
         if cil is not None or "neverallow" not in complaint:
-            problems.append(f"level {level}: '{rule}' is not refused: {complaint}")
+            problems.append(f"level {level}: '{rule}' is not refused by a neverallow rule: {complaint}")
     return problems
 
 
@@ -167,7 +168,7 @@ def check_names():
     for name in programs:
         count = sum(bool(re.fullmatch(p, f"/system/bin/{name}")) for p in patterns)
         if count != 1:
-            problems.append(f"/system/bin/{name} has {count} labels")
+            problems.append(f"/system/bin/{name} matches {count} patterns of file_contexts, not 1")
     for pattern in patterns:
         if not any(re.fullmatch(pattern, f"/system/bin/{name}") for name in programs):
             problems.append(f"file_contexts: {pattern} matches no installed program")

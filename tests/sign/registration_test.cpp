@@ -1,4 +1,4 @@
-// Tests registrations: the file, the name, the bytes, and the log.
+// Tests ZuSign: the file, the name and the bytes that it registers, and the messages that it logs.
 #include "sign/registration.h"
 
 #include <gtest/gtest.h>
@@ -121,7 +121,7 @@ TEST(ZuSign, JarWithoutTheAttributeIsSkippedSilently) {
   EXPECT_EQ(file.log.records(), Records());
 }
 
-// Only the size of the attribute is read, from the file of the first descriptor.
+// The attribute is read from the file of the first descriptor. Only the attribute's size is read.
 TEST(ZuSign, AttributeSizeIsReadFromTheFirstDescriptor) {
   ArchiveOnPhone file(MakePackage(PlainJar()));
   file.phone.zu_attribute_size = 1;

@@ -1,6 +1,6 @@
-// Puts compiled Android manifests, JAR manifests and their tables in a block at the end of the
-// readable memory. If the platform's parser or the tool's code reads beyond the block, the test
-// crashes.
+// Puts compiled Android manifests, JAR manifests, and the tables of JAR manifests in a block at the
+// end of a memory area (support/memory_end.h). If the platform's parser or the tool's code reads
+// beyond the area, the test crashes.
 #include <gtest/gtest.h>
 
 #include "apk/apk.h"
@@ -13,8 +13,8 @@
 namespace {
 
 // Parses the document at the end of memory, in the block that the tool allocates for it. The block
-// is 20 bytes longer than the document, because the platform's parser reads an attribute (20 bytes)
-// or a chunk header (8 bytes) before it checks that the document contains it.
+// is 20 bytes longer than the document, because the platform's parser can read an attribute (20
+// bytes) or a chunk header (8 bytes) that ends beyond the document.
 bool ParseAtMemoryEnd(ApkTools::Apk* apk, const Bytes& document) {
   PutNextBlockAtMemoryEnd(document.size() + 20);
   const bool parsed = apk->ParseAndroidManifest(document);
@@ -84,7 +84,7 @@ TEST(CompiledManifestAtMemoryEnd, IsRefusedIfShorterThanAHeader) {
   }
 }
 
-// The table for sorting has a hash and a number for each section.
+// The table for sorting has a hash and an index for each section.
 TEST(EntryDigestsAtMemoryEnd, AreSortedWithoutAccessBeyondTheTable) {
   constexpr size_t kSections = 33;
   std::string text;
@@ -104,8 +104,8 @@ TEST(EntryDigestsAtMemoryEnd, AreSortedWithoutAccessBeyondTheTable) {
   EXPECT_EQ(digest, "1");
 }
 
-// The table is sorted when a name starts at offset 1024 of the text or later. Here, that is the
-// name of the 33rd attribute (32 * 32 = 1024), which also fills the table.
+// The table is sorted when the name of a new attribute starts at offset 1024 of the text or later.
+// Here, the 33rd attribute is the first such attribute (32 * 32 = 1024). It also fills the table.
 TEST(ManifestSectionsAtMemoryEnd, AreNotReadBeyondTheLastAttribute) {
   constexpr uint32_t kAttributes = 33;
   std::string text;
@@ -122,9 +122,9 @@ TEST(ManifestSectionsAtMemoryEnd, AreNotReadBeyondTheLastAttribute) {
   EXPECT_EQ(sections[0].find("83"), std::string(30, 'v'));
 }
 
-// Names and lines of values have 1 to 19 bytes, because the parser reads eight bytes at once. The
-// text is cut at each multiple of 4 bytes, because only a block of such a size ends exactly where
-// memory ends.
+// The parser reads eight bytes at once. Names and lines of values therefore have each length from 1
+// to 19 bytes: shorter and longer than eight bytes, with each remainder. The text is cut at each
+// multiple of 4 bytes, because only a block of such a size ends exactly at the end of the area.
 TEST(JarManifestAtMemoryEnd, IsNotReadBeyondTheBlockAtAnyLength) {
   for (size_t length = 1; length < 20; ++length) {
     const std::string run(length, 'v');

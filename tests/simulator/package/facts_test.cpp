@@ -156,8 +156,9 @@ TEST(PackageFacts, EntryWithASha1DigestIsMarked) {
             std::vector<std::string>({"a"}));
 }
 
-// The digests other than "AAAA" are those of "x", as coreutils and xxd print them: printf x |
-// sha256sum | xxd -r -p | base64, and the same with sha1sum.
+// The digests other than "AAAA" are digests of "x". This command prints the SHA-256 digest:
+//   printf x | sha256sum | xxd -r -p | base64
+// With sha1sum in place of sha256sum, the command prints the SHA-1 digest.
 TEST(PackageFacts, EachListedEntryIsComparedWithItsDigest) {
   const std::string manifest =
       "Manifest-Version: 1.0\r\n\r\n"
@@ -217,8 +218,8 @@ TEST(PackageFacts, IncludeDamagedEntries) {
   EXPECT_FALSE(facts.libraries[0].is_met);
 }
 
-// The zip library chooses the order of the entries, and so decides which libraries come after the
-// damage.
+// The zip library chooses the order of the entries. This test therefore does not know which
+// libraries come after the first damaged library.
 TEST(PackageFacts, LibrariesAfterADamagedOneAreNotReached) {
   PackageOptions options;
   for (int i = 0; i < 64; ++i) {

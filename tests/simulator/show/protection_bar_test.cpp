@@ -46,7 +46,7 @@ TEST(ProtectionBar, GivesEmptyPartsNoWidth) {
   EXPECT_DOUBLE_EQ(parts[1].width, 100);
 }
 
-// The entries of an archive can share their bytes.
+// Entries of an archive can overlap. Together they can then have more bytes than the file.
 TEST(ProtectionBar, AcceptsMoreBytesThanTheFileHas) {
   const auto parts = DrawBar({{1, UINT64_MAX}, {1, UINT64_MAX}, {}, {}, {}}, 1000);
   EXPECT_EQ(Percents(parts), std::vector<double>({50, 50, 0, 0, 0}));

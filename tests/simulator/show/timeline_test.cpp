@@ -108,7 +108,6 @@ TEST(Timeline, EmptyPayloadIsShownAsNoData) {
 )");
 }
 
-// A payload of 32 bytes is called a digest.
 TEST(Timeline, OnlyAPayloadOf32BytesIsCalledADigest) {
   const auto payload = [](const std::string& data) {
     const Events events = ParseEvents("{\"event\":\"sign\",\"path\":\"/a\",\"payload\":\"0000" +

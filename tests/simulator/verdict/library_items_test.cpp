@@ -18,8 +18,8 @@ TEST(MakeReport, LibraryWithOtherBytesIsRefused) {
   EXPECT_FALSE(report.items[1].is_verified);
 }
 
-// The item of a library for which the tool logs `error`. `opening` is the errno of opening it, or
-// 0.
+// The item of a library for which the tool logs `error`. `opening` is LibraryFacts::error: the
+// errno of opening the library's file, or 0 if the file can be opened.
 std::string LibraryItem(const std::string& error, int opening = 0, bool has_directory = false,
                         const JudgeOptions& options = {}) {
   const Report report = Made(
@@ -73,8 +73,8 @@ TEST(MakeReport, LibraryThatStaysInThePackageHasItsOwnReason) {
             "lib/arm64/libfoo.so absent library-in-package");
 }
 
-// The tool reads the entries in order and stops at the damaged entry. Later libraries are not
-// signed, even if they are good.
+// The tool reads the entries in order and stops at a damaged entry. Later libraries are not signed,
+// even if they are good.
 TEST(MakeReport, LibraryAfterADamagedEntryIsRefusedIfInstalled) {
   const auto items = [](int error, bool is_strict) {
     PackageFacts facts =
