@@ -1,6 +1,7 @@
-// The digests that the manifest records for entries. The object contains the manifest, and an
-// ordered map from each entry's name to the name and the value of its digest attribute. A section
-// that lacks one of these three texts is left out. Only the manifest's parser logs.
+// Finds the digest that a JAR manifest lists for an entry. The object owns the manifest's text, and
+// an index of its sections by the entry's name. The index leaves out sections without a name or
+// without a digest attribute. If several sections of the index have the same name, the last section
+// counts. Only Load logs: the messages of ManifestMf::load.
 #pragma once
 
 #include <cstdint>
@@ -19,7 +20,8 @@ class EntryDigests {
   // Lists the digests of the loaded manifest's sections. Before this call, Find returns false for
   // every name.
   void List();
-  // Returns false, with both texts untouched, if no digest is listed for the entry of this name.
+  // Stores the name of the entry's digest attribute in `digest_name`, and its value in `digest`.
+  // Returns false, and changes neither text, if no digest is listed for the entry `name`.
   bool Find(std::string_view name, std::string& digest_name, std::string& digest) const;
 
  private:
@@ -27,10 +29,10 @@ class EntryDigests {
   std::string_view NameOf(uint32_t section) const;
 
   ManifestMf manifest_mf_;
-  // The indexes of the listed sections. If the text has its names in byte order, the indexes are in
-  // the order of the text, and hashes_ is empty. Otherwise the indexes are sorted by the hash of
-  // the name, then by the name, then by the place in the text. hashes_ then contains the hash for
-  // each element of sections_.
+  // The numbers of the listed sections in the manifest. If the names of these sections are in byte
+  // order in the text, sections_ has the order of the text, and hashes_ is empty. Otherwise
+  // sections_ is sorted by the hash of the name, then by the name, then by the section's number. In
+  // that case, hashes_[i] is the hash of the name of sections_[i].
   std::vector<uint32_t> sections_;
   std::vector<size_t> hashes_;
 };

@@ -37,8 +37,8 @@ bool Apk::VerifyFileHash(const std::string& name, const std::string& path, struc
   return VerifyContent(name, [&] { return ReadFile(path, content_, state, fd); });
 }
 
-// `read_content` fills the empty content_, and returns true for success. It is called only if the
-// manifest lists `name`.
+// `read_content` fills the empty content_, and returns true for success. VerifyContent calls
+// `read_content` only if the manifest lists `name`.
 template <typename ReadContent>
 bool Apk::VerifyContent(const std::string& name, ReadContent read_content) {
   std::string digest_name, digest;

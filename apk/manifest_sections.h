@@ -9,8 +9,9 @@
 #include <utility>
 #include <vector>
 
-// A piece of the text: its offset and its length, in bytes. 32 bits are enough for any entry of an
-// archive, and they keep the table small: a large manifest has several hundred thousand pieces.
+// A piece of the text: its offset and its length, in bytes. 32 bits are enough, because
+// ManifestMf::load refuses a text of 4 GiB or more. 32 bits also keep the table small: a large
+// manifest has several hundred thousand pieces.
 struct ManifestPiece {
   uint32_t start = 0;
   uint32_t length = 0;
@@ -21,7 +22,7 @@ struct ManifestAttribute {
   ManifestPiece value;
 };
 
-// Iterates over a range by index, and makes each element when it is read.
+// Iterates over a range by index. operator* makes the element at the index.
 template <typename Range>
 class ElementIterator {
  public:
@@ -45,8 +46,9 @@ class ElementIterator {
   size_t index_;
 };
 
-// An ordered map from the names of attributes to their values, in byte order of the names. If names
-// are equal, the last one in the text counts. Names and values are never empty.
+// An ordered map from the names of attributes to their values, in byte order of the names. Of
+// attributes with equal names, the map has only the last in the text. Names and values are never
+// empty.
 class ManifestSection {
  public:
   // Name and value.
@@ -60,10 +62,10 @@ class ManifestSection {
   ElementIterator<ManifestSection> begin() const { return {this, 0}; }
   ElementIterator<ManifestSection> end() const { return {this, size_}; }
 
-  // The value of the attribute of this name; empty if the section does not have it.
+  // The value of the attribute `name`; empty if the section has no such attribute.
   std::string_view find(std::string_view name) const;
-  // The last attribute, in byte order, whose name ends in `suffix`; two empty texts if no name ends
-  // in it.
+  // The attribute whose name ends in `suffix`. If several names do, the last name in byte order
+  // counts. If no name does, the result is two empty texts.
   value_type findLastEndingIn(std::string_view suffix) const;
 
  private:
@@ -82,17 +84,19 @@ class ManifestSections {
   ElementIterator<ManifestSections> begin() const { return {this, 0}; }
   ElementIterator<ManifestSections> end() const { return {this, size()}; }
 
-  // The parser fills the table with the three functions below. reset removes all sections.
-  // Attributes that are added afterwards must be pieces of the `size` bytes at `text`.
+  // The parser calls the three functions below to fill the table. reset removes all sections and
+  // opens an empty section. Attributes that are added afterwards must be pieces of the `size` bytes
+  // at `text`.
   void reset(const uint8_t* text, size_t size);
-  // Adds an attribute to the open section. Its name and its value must not be empty. A repeated
-  // name takes memory only until the section is sorted the next time.
+  // Adds an attribute to the open section. The attribute's name and value must not be empty. The
+  // next sort of the section drops an attribute if a later attribute has the same name.
   void add(const ManifestAttribute& attribute);
-  // Ends the open section, which may be empty. Only ended sections are visible.
+  // Sorts and ends the open section, which may be empty, and opens the next section. Only ended
+  // sections are visible.
   void endSection();
 
  private:
-  // Within a section, add() sorts again only after at least this many bytes of text.
+  // After a sort, add() sorts the same section again only after at least this many bytes of text.
   static constexpr size_t kLittleText = 1024;
 
   size_t openStart() const { return ends_.empty() ? 0 : ends_.back(); }

@@ -9,8 +9,8 @@
 namespace ApkTools {
 
 struct LibraryDirectory {
-  std::string_view entry_prefix;  // the start of the names in the archive
-  const char* installed;          // where the installer puts those libraries, beside the package
+  std::string_view entry_prefix;  // the start of the entries' names in the archive
+  const char* installed;          // the start of the extracted files' paths beside the package
 };
 
 // The first row whose prefix matches wins. The row "lib/armeabi" is the last, because its prefix
@@ -24,14 +24,14 @@ inline constexpr LibraryDirectory kLibraryDirectories[] = {
     {"lib/armeabi", "lib/arm"},
 };
 
-// The path on disk of the library `entry_name` of the package at `package_path`. It is beside the
-// package, or relative to the working directory if `package_path` has no "/". Empty if no row of
-// the table matches.
+// The path on disk of the library `entry_name` of the package at `package_path`. The result is
+// below the directory of `package_path`. If `package_path` has no "/", the result is relative to
+// the working directory. Empty if no row of the table matches.
 inline std::string InstalledLibraryPath(const std::string& package_path,
                                         const std::string& entry_name) {
   for (const LibraryDirectory& row : kLibraryDirectories) {
     // Deliberate: prefixes need not end at a "/". For example, "lib/armeabiX/a.so" is looked for in
-    // "lib/armX/". The digest check afterwards still decides whether the file is signed.
+    // "lib/armX/". The file is still signed only if its bytes have the manifest's digest.
     if (entry_name.compare(0, row.entry_prefix.size(), row.entry_prefix) != 0) continue;
     const size_t slash = package_path.rfind('/');
     const auto directory = package_path.substr(0, slash == std::string::npos ? 0 : slash + 1);

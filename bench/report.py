@@ -1,8 +1,8 @@
 """bench/report.py BUILD-DIRECTORY: measures the tool and two programs for comparison. The floor
 (bench_floor) does the tool's job without the verification. The peer (bench_peer) does the
-tool's job with OpenSSL. Prints tables of the results, and writes them to docs/performance.md. Writes
-the plots to docs/performance-entries.svg and docs/performance-time.svg. scripts/bench calls this
-script."""
+tool's job with OpenSSL. Prints tables of the results, and writes the tables to
+docs/performance.md. Writes the plot docs/performance-entries.svg. Also writes the plot
+docs/performance-time.svg, but only if perf works. scripts/bench calls this script."""
 
 import collections
 import datetime
@@ -71,7 +71,8 @@ def package_path(name):
 # ---- Whole processes.
 
 def run_in_turns(rounds, programs, file):
-    """A list of (wall, cpu, memory) for each program, in microseconds and kilobytes."""
+    """Maps each program to a list with the (wall, cpu, memory) of each run. wall and cpu are in
+    microseconds, memory is in kilobytes."""
     output = subprocess.run([f'{BUILD}/bench/bench_run', str(rounds), *programs, '--', file],
                             check=True, capture_output=True, text=True).stdout
     runs = collections.defaultdict(list)
@@ -87,9 +88,9 @@ def measure(package):
 
 
 def expect_same_log(package):
-    """Exits if the three programs did not write the same log, or if this log has no signing step
-    with the result 65536. This result means that the step failed. It is expected here, because the
-    kernel of a workstation has no integrity feature."""
+    """Exits if the logs of the three programs differ in more than times and process numbers. Also
+    exits if the log has no signing step with the result 65536, which means that the step failed.
+    The step must fail, because the kernel of a workstation has no integrity feature."""
     logs = {re.sub(r'\d\d-\d\d \d\d:\d\d:\d\d +\d+ +\d+', '', subprocess.run(
         [program, package_path(package.name)], check=True, capture_output=True, text=True).stderr)
         for program in (TOOL, FLOOR, PEER)}
@@ -102,7 +103,7 @@ def median(runs, column):
 
 
 def ratio(runs, other, column):
-    """The median ratio of the tool's runs to the runs of `other` in the same rounds."""
+    """The median of the ratios of all rounds: the tool's value divided by the value of `other`."""
     return statistics.median(a[column] / b[column] for a, b in zip(runs[TOOL], runs[other]))
 
 

@@ -1,10 +1,12 @@
-// bench_run ROUNDS PROGRAM... -- FILE: starts the programs with FILE in turns (A B C A B C ...), so
-// that other load on the machine affects all of them alike. Prints a line for each run:
+// bench_run ROUNDS PROGRAM... -- FILE: runs each program ROUNDS times with the argument FILE. The
+// programs run in turns (A B C A B C ...), so that other load on the machine affects all of them
+// alike. bench_run ends at the first run that fails. After each successful run, bench_run prints a
+// line:
 //
 //   PROGRAM <TAB> wall microseconds <TAB> cpu microseconds <TAB> peak resident kilobytes
 //
-// bench_run is a small, separate program, because the peak memory of a child process starts at the
-// peak of its parent.
+// The measured peak memory of a program is at least the peak of the process that starts the
+// program. bench_run is therefore a small, separate program.
 #include <fcntl.h>
 #include <spawn.h>
 #include <sys/resource.h>
@@ -32,7 +34,8 @@ void Fail(const char* what) {
   exit(1);
 }
 
-// Runs the program once, with its output in /dev/null. Prints the line for this run.
+// Runs the program once, with its output in /dev/null. Prints the line for this run, or ends
+// bench_run with status 1 if the run fails.
 void Run(char* program, char* file, const posix_spawn_file_actions_t* silent) {
   char* arguments[] = {program, file, nullptr};
   const long long start = Now();

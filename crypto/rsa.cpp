@@ -60,8 +60,8 @@ int rsa_pkcs1_verify(const rsa_context* ctx, const uint8_t* sha1, const uint8_t*
 
   uint8_t* const info = skip_padding(em, len);
   if (info == nullptr) return kRsaInvalidPadding;
-  // Deliberate: here and below, the texts keep their spelling and have no line end. Programs that
-  // parse the log match on them.
+  // Deliberate: the log messages of this file keep their spelling and have no line end. Programs
+  // that parse the log match on these messages.
   switch (em + len - info) {
     case sizeof(kSha256Prefix) + kSha256Size:
       if (sha256 == nullptr) return invalid_padding();
@@ -81,9 +81,10 @@ int rsa_pkcs1_verify(const rsa_context* ctx, const uint8_t* sha1, const uint8_t*
 
 namespace {
 
-// Stores the exponent as a signed 32-bit number. Deliberate: if memory runs out, the exponent stays
-// empty and no error is returned. An empty exponent verifies no signature, because every power is
-// then 1, which has no valid padding.
+// Stores `exponent_value`, read as a signed 32-bit number, in `E`. Deliberate: if memory runs out,
+// the exponent stays empty and no error is returned. An empty exponent counts as 0. A number to the
+// power of 0 is 1, and 1 has no valid padding. A key with an empty exponent therefore verifies no
+// signature.
 WRAPS_ON_PURPOSE void set_exponent(mpi* E, uint32_t exponent_value) {
   if (exponent_value == 0 || mpi_grow(E, 1) != 0) return;
   const bool negative = exponent_value > INT32_MAX;
@@ -121,9 +122,9 @@ bool holds(const uint8_t* info, const uint8_t* prefix, size_t prefix_size, const
   return memcmp(info, prefix, prefix_size) == 0 && memcmp(info + prefix_size, digest, size) == 0;
 }
 
-// Deliberate: only MD5 is supported. A prefix that differs from MD5's only in the algorithm's byte,
-// such as that of MD2 or MD4, is logged as invalid padding. A prefix that differs in another byte
-// is refused without a message.
+// Deliberate: of MD2, MD4 and MD5, only MD5 is supported. A prefix that differs from MD5's only in
+// the algorithm's byte, such as the prefix of MD2 or MD4, is refused and logged as invalid padding.
+// A prefix that differs in another byte is refused without a message.
 int check_md5(uint8_t* info, const uint8_t* md5) {
   const uint8_t algorithm = info[kMdAlgorithmIndex];
   info[kMdAlgorithmIndex] = 0;

@@ -1,5 +1,5 @@
-// apk/base64.h: decodes any text into a buffer of 0 to 63 bytes. A second decoder, which first
-// collects all bits, must agree.
+// apk/base64.h: decodes any text with Base64Decode. Also decodes the text with base64decode into a
+// buffer of 0 to 63 bytes. Both results must agree with ReadBase64 (fuzz/models.h).
 #include "apk/base64.h"
 
 #include "fuzz/fuzz.h"
@@ -10,7 +10,7 @@ extern "C" int LLVMFuzzerTestOneInput(const uint8_t* data, size_t size) {
   const std::string text(reinterpret_cast<const char*>(data) + 1, size - 1);
   const std::optional<std::vector<uint8_t>> expected = ReadBase64(text);
   Require(Base64Decode(text) == (expected.value_or(std::vector<uint8_t>())),
-          "both decoders return the same bytes");
+          "Base64Decode returns the bytes of ReadBase64, or none for a refused text");
 
   const size_t room = data[0] % 64;
   std::vector<uint8_t> out(room);
@@ -23,6 +23,6 @@ extern "C" int LLVMFuzzerTestOneInput(const uint8_t* data, size_t size) {
     return 0;
   }
   out.resize(length);
-  Require(expected == out, "both decoders return the same bytes if they fit");
+  Require(expected == out, "an accepted text is base64 and has the bytes of ReadBase64");
   return 0;
 }

@@ -9,15 +9,16 @@
 #include <cstdio>
 #include <cstdlib>
 
-// Ends the run like a memory fault if an invariant does not hold.
+// `what` states an invariant. If `holds` is false, prints `what` and ends the process with abort(),
+// which libFuzzer reports as a crash.
 inline void Require(bool holds, const char* what) {
   if (holds) return;
   fprintf(stderr, "broken: %s\n", what);
   abort();
 }
 
-// True if the `length` bytes at `part` lie in the `size` bytes at `whole`. A null `part` must be
-// empty.
+// True if the `length` bytes at `part` lie in the `size` bytes at `whole`. If `part` is null, true
+// only if `length` is 0.
 inline bool LiesIn(const uint8_t* part, size_t length, const uint8_t* whole, size_t size) {
   if (part == nullptr) return length == 0;
   return part >= whole && part <= whole + size &&

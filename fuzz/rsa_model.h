@@ -1,5 +1,5 @@
-// RSA PKCS#1 v1.5 (RFC 8017), computed with libcrypto's big numbers. Where the tool's rules are
-// more lenient than the standard, the model has the tool's rules: any exponent, any padding length.
+// RSA PKCS#1 v1.5 (RFC 8017), computed with libcrypto's big numbers. The model accepts any
+// exponent and any padding length, because rsa_pkcs1_verify (crypto/rsa.h) accepts them too.
 #pragma once
 
 #include <cstdint>

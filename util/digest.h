@@ -16,7 +16,8 @@ void ComputeSHA1Digest(const std::vector<uint8_t>& in, std::vector<uint8_t>& out
 // 32 bytes.
 void ComputeSHA256Digest(const std::vector<uint8_t>& in, std::vector<uint8_t>& out);
 
-// The digests that a signature can cover. The signature itself names the one that it covers.
+// The digests of signed data with the three algorithms above. A signature itself names its digest
+// algorithm.
 struct Digests {
   std::vector<uint8_t> sha1;
   std::vector<uint8_t> sha256;

@@ -13,8 +13,8 @@
 
 namespace {
 
-// The link in /proc to the file that is open as `fd`. It leads to this file even if the file's path
-// no longer does.
+// The path of the link in /proc to the file that is open as `fd`. This link leads to the file even
+// after the file was renamed or removed.
 std::string DescriptorLink(int fd) { return "/proc/self/fd/" + std::to_string(fd); }
 
 ssize_t FindSize(int fd, struct stat* state);
@@ -58,9 +58,8 @@ bool ReadFile(const std::string& path, std::vector<uint8_t>& out, struct stat* s
   if (out.empty() && out.capacity() < static_cast<size_t>(size)) std::vector<uint8_t>().swap(out);
   out.resize(static_cast<size_t>(size));
   // Deliberate: reading succeeds even if the file shrinks meanwhile. The end of `out` then keeps
-  // its old bytes, or is 0. SignLibrary (sign/signing.cpp) compares the digest of `out` with the
-  // manifest's digest. It also compares `state` with the file's later state, so it notices a file
-  // that shrank even if the digests are equal.
+  // its old bytes, or is 0. The digest of `out` can therefore be right although the file shrank.
+  // SignLibrary (sign/signing.cpp) therefore also compares `state` with the file's later state.
   ReadBytes(fd, out);
   if (state != nullptr) *state = found;
   return true;
@@ -76,9 +75,9 @@ std::vector<uint8_t> StringToVector(const std::string& s) { return {s.begin(), s
 
 namespace {
 
-// Returns the size of the regular file `fd` in bytes. Stores its state in `state`, and sets its
-// position to the start. Returns -1 if `fd` is not a regular file, cannot seek, or does not fit in
-// memory.
+// Returns the size in bytes of the file that is open as `fd`. Stores the file's state in `state`,
+// and sets the position of `fd` to the start. Returns -1 if the file is not regular, cannot seek,
+// or does not fit in memory.
 ssize_t FindSize(int fd, struct stat* state) {
   if (fstat(fd, state) != 0 || !S_ISREG(state->st_mode)) return -1;
   const off_t size = lseek(fd, 0, SEEK_END);
@@ -86,7 +85,7 @@ ssize_t FindSize(int fd, struct stat* state) {
   return lseek(fd, 0, SEEK_SET) == 0 ? size : -1;
 }
 
-// Fills `out` from `fd` until the file ends or cannot be read.
+// Reads from `fd` into `out` until `out` is full, the file ends, or a read fails.
 void ReadBytes(int fd, std::vector<uint8_t>& out) {
   size_t done = 0;
   while (done < out.size()) {

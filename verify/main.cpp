@@ -1,7 +1,7 @@
-// apktoolkit-verify asks the kernel whether it trusts each file, and prints one line per file. It
-// does not read the files and logs nothing: the kernel alone decides. Exit status: 0 if all files
-// are trusted; 1 if a file is not trusted or cannot be opened; 2 if the command line is wrong or
-// the output cannot be written.
+// apktoolkit-verify prints one line per file: whether the kernel trusts the file. The program does
+// not read the files and logs nothing. The kernel alone decides whether a regular file is trusted.
+// No other file is trusted. Exit status: 0 if all files are trusted; 1 if a file is not trusted or
+// cannot be opened; 2 if the command line is wrong or the output cannot be written.
 #include <fcntl.h>
 #include <sys/stat.h>
 #include <unistd.h>

@@ -15,8 +15,9 @@ import java.util.LinkedHashSet;
 import java.util.Set;
 
 /**
- * Names the current RSA signers that the package manager knows for a package, by the same digest
- * that apktoolkit passes to the kernel. Use this class in the process that installs packages.
+ * Lists the package manager's current RSA signers of a package. Each signer is shown as the SHA-256
+ * digest of the key's modulus. apktoolkit passes the same digest of the JAR signer's key to the
+ * kernel. Use this class in the process that installs packages.
  *
  * <p>Of a package's signature schemes, the package manager uses the newest one that it knows.
  * apktoolkit uses the JAR signature, whose signer can be a different one. Pass a package to
@@ -28,10 +29,10 @@ public final class SignerDigests {
 
     /**
      * Returns the digests of the current signers of an installed package. Needs API level 28 or
-     * later ({@code PackageManager.GET_SIGNING_CERTIFICATES}). If the key was rotated, earlier keys
-     * are left out on purpose, because somebody else can have a retired key. apktoolkit passes only
-     * a digest of the key to the kernel, not the name of the package. The kernel could therefore
-     * not distinguish that person's packages from the owner's.
+     * later ({@code PackageManager.GET_SIGNING_CERTIFICATES}). If the key was rotated, the result
+     * leaves out the earlier keys on purpose, because an attacker may have an earlier key. The
+     * kernel gets only the digest of a key, not the name of the package. If an earlier key were
+     * accepted, the kernel could not distinguish the attacker's packages from the owner's.
      */
     public static String of(SigningInfo info) throws CertificateException {
         return of(info.getApkContentsSigners());

@@ -122,7 +122,8 @@ PublicKey ReadKey(X509* certificate) {
   return key;
 }
 
-// Uses the library's comparison, which accepts both UTCTime and GeneralizedTime.
+// Returns the seconds from 1970 to `time`. ASN1_TIME_diff accepts both UTCTime and
+// GeneralizedTime.
 std::optional<int64_t> SecondsOf(const ASN1_TIME* time) {
   constexpr int64_t kSecondsOfDay = 86'400;
   const bssl::UniquePtr<ASN1_TIME> start(ASN1_TIME_set(nullptr, 0));
@@ -133,8 +134,8 @@ std::optional<int64_t> SecondsOf(const ASN1_TIME* time) {
 }
 
 // Writes the RelativeDistinguishedNames in reverse order, and the attributes inside each of them in
-// their own order. Names with more than kMostAttributes attributes are cut. Ordinary names have far
-// fewer.
+// their own order. Leaves out all attributes after the first kMostAttributes. Ordinary names have
+// far fewer attributes.
 std::string NameText(const X509_NAME* name) {
   constexpr int kMostAttributes = 256;
   std::string text, part;
@@ -151,9 +152,10 @@ std::string NameText(const X509_NAME* name) {
   return text;
 }
 
-// The library could print the whole name, but its keywords differ from those of the JDK. People
-// search for the JDK's keywords. Here the library prints only the value: in quotation marks if it
-// has special characters, and as hexadecimal digits if it is not a text.
+// Writes the JDK's keywords for the usual types of attributes, because people search for these
+// keywords. The library's own function for names writes other keywords. Here the library therefore
+// prints only the value: in quotation marks if the value has special characters, and as hexadecimal
+// digits if the value is not a text.
 std::string AttributeText(const X509_NAME_ENTRY* attribute) {
   constexpr unsigned long kFlags = ASN1_STRFLGS_ESC_2253 | ASN1_STRFLGS_ESC_QUOTE |
                                    ASN1_STRFLGS_UTF8_CONVERT | ASN1_STRFLGS_DUMP_UNKNOWN |
@@ -181,7 +183,7 @@ std::string KeyKind(const ASN1_OBJECT* algorithm) {
 }
 
 // If the library knows the algorithm and its digest, the result has the form of keytool's -sigalg,
-// such as "SHA256withRSA". Otherwise it is the name from AlgorithmOf.
+// such as "SHA256withRSA". Otherwise the result is the name from AlgorithmOf.
 std::string SignatureName(const ASN1_OBJECT* algorithm) {
   int digest = NID_undef;
   int key = NID_undef;

@@ -67,23 +67,24 @@ EntryDigest Compare(Archive* archive, const EntryDigests& manifest, const Archiv
   return IsKnownDigest(digest_name, tool) ? EntryDigest::kDiffers : EntryDigest::kNotCompared;
 }
 
-// True if `name` is the name of a SHA-1 digest: the tool then accepts the SHA-1 digest of an empty
-// text.
+// True if `name` is the name of a SHA-1 digest for the tool. Asks the tool whether the SHA-1 digest
+// of an empty text is right under this name.
 bool IsSha1Digest(const std::string& name, Apk* tool) {
   std::vector<uint8_t> sha1;
   ComputeSHA1Digest({}, sha1);
   return tool->VerifyData(name, sha1, {});
 }
 
-// True if the tool supports digests with this name: it then accepts the SHA-1 or the SHA-256 digest
-// of an empty text.
+// True if the tool supports digests with this name. Tries the SHA-1 and the SHA-256 digest of an
+// empty text.
 bool IsKnownDigest(const std::string& name, Apk* tool) {
   std::vector<uint8_t> sha256;
   ComputeSHA256Digest({}, sha256);
   return IsSha1Digest(name, tool) || tool->VerifyData(name, sha256, {});
 }
 
-// True for the manifest, signature files and their blocks. A manifest does not list these entries.
+// True for the names of the manifest, of signature files and of signature blocks. Signing programs
+// do not list these entries in the manifest.
 bool IsSignatureName(const std::string& name) {
   constexpr std::string_view kDirectory = "META-INF/";
   if (name == Apk::kMANIFEST_MF) return true;
@@ -93,8 +94,8 @@ bool IsSignatureName(const std::string& name) {
          EndsWith(name, ".DSA");
 }
 
-// Returns the names that the manifest has but the archive does not have. They are in the order of
-// the manifest, each once.
+// Returns the names that have a digest in the manifest but are not in `entries`. Each name is
+// returned once, in the order of the manifest.
 std::vector<std::string> FindMissing(std::vector<uint8_t> text, const EntryDigests& manifest,
                                      const std::vector<ListedEntry>& entries) {
   std::unordered_set<std::string> known;

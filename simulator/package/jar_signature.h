@@ -27,7 +27,7 @@ struct ToolKey {
 
 struct JarSignatureFacts {
   Archive::ReadResult manifest = Archive::ReadResult::kMissing;  // META-INF/MANIFEST.MF
-  // The entries META-INF/*.SF, in the tool's order. The tool uses the first one.
+  // The entries META-INF/*.SF, in the order in which the tool finds them. The tool uses the first.
   std::vector<std::string> signature_files;
   std::string claimed_schemes;        // X-Android-APK-Signed, such as "2, 3"; empty: not stated
   bool has_manifest_digest = false;   // the signature file has a digest of the manifest
@@ -40,8 +40,8 @@ struct JarSignatureFacts {
   std::optional<ToolKey> key;
 
   SignatureBlockFacts block;  // read as strict DER; its member `certificate` is always empty
-  // The first certificate; none if it cannot be parsed, or if the tool reads the key from another
-  // certificate.
+  // The first certificate of the block. None if this certificate cannot be parsed, or if the tool
+  // reads the key from another certificate.
   std::optional<CertificateFacts> certificate;
   // The first signer's identifier does not name the first certificate.
   bool names_other_certificate = false;

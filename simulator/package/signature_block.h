@@ -12,10 +12,10 @@ namespace simulator {
 
 struct SignatureBlockFacts {
   bool is_whole = false;         // the block could be read to its last signer
-  std::string_view certificate;  // the first one, in the caller's bytes; DER
+  std::string_view certificate;  // the first certificate, DER; points into the block
   size_t signer_count = 0;
   // Of the first signer:
-  std::string signer_id;  // contents of its SignerIdentifier (RFC 5652 §5.3)
+  std::string signer_id;  // contents of the SignerIdentifier (RFC 5652 §5.3)
   bool has_signed_attributes = false;
   std::string digest;             // such as "SHA256"
   bool has_known_digest = false;  // MD5, SHA-1 or SHA-256

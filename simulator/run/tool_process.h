@@ -10,10 +10,10 @@
 namespace simulator {
 
 struct ToolCommand {
-  std::vector<std::string> runner;  // words before the tool, such as an emulator's; mostly none
+  std::vector<std::string> runner;  // an emulator and its options; empty: the tool starts directly
   std::string tool;
   std::string file;                      // the tool's one argument
-  std::string kernel;                    // the library that is loaded before all others
+  std::string kernel;                    // the library of the kernel's stand-in, loaded first
   std::vector<std::string> environment;  // NAME=VALUE; adds to or replaces this process's variables
 };
 
@@ -24,16 +24,18 @@ struct ToolEnd {
   int value;  // kExited: the status. kKilled: the signal. kNotStarted: the errno. Otherwise 0.
 };
 
-// Runs the command to its end, or kills it after the deadline. Discards the command's standard
-// output, because a stand-in records it in the journal. The command's standard input and standard
-// error are those of this process.
+// Runs the command to its end. If the command still runs after the deadline, RunTool kills the
+// command; the result is then kStopped. RunTool discards the command's standard output, because the
+// library `kernel` records the tool's output in the journal. The command's standard input and
+// standard error are those of this process.
 ToolEnd RunTool(const ToolCommand& command, const Deadline& deadline);
 
-// The program that is started: the runner, or else the tool.
+// The program that RunTool starts: the first word of the runner, or the tool if there is no runner.
 const std::string& ProgramOf(const ToolCommand& command);
 
-// The directory of this program, without a "/" at the end. The tool is in the same directory, and
-// the stand-ins are in ../lib/apktoolkit, both in the build tree and in an installation.
+// The directory of the running program, without a "/" at the end. The tool is in the same
+// directory. The stand-ins are in ../lib/apktoolkit, relative to this directory. The layout is the
+// same in the build tree and in an installation.
 std::string ProgramDirectory();
 
 }  // namespace simulator

@@ -26,8 +26,8 @@ bool AreSame(const struct stat& one, const struct stat& other) {
   return one.st_dev == other.st_dev && one.st_ino == other.st_ino;
 }
 
-// The path of the file that a write to `path` would open or create. The last part of `path` need
-// not exist. It may be a link to a file that does not exist.
+// The path of the file that a write to `path` would open or create. `path` may name a file that
+// does not exist, or a link to such a file.
 fs::path Resolved(const std::string& path) {
   constexpr int kMostLinks = 40;  // the kernel's limit
   std::error_code error;

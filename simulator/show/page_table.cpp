@@ -15,8 +15,7 @@ using kainjow::mustache::data;
 using kainjow::mustache::list;
 using kainjow::mustache::object;
 
-// From the worst to the best. Nothing is known about a file with the first verdict. Nothing is
-// wrong with a file with the last verdict.
+// All verdicts, from the worst to the best. The rows of the table are in this order.
 constexpr Verdict kWorstFirst[] = {
     Verdict::kNotSimulated,  Verdict::kNotLookedAt,    Verdict::kRefused,
     Verdict::kNotTrustedJar, Verdict::kNotInstallable, Verdict::kNotAccepted,
@@ -33,9 +32,8 @@ object Choice(const std::string& code, const std::string& word, size_t count);
 
 }  // namespace
 
-// Texts from a package can have any length, so each text is cut before it is joined with others. If
-// the joined text were cut instead, a signer's long name could remove the key that follows the
-// name.
+// Texts from a package can have any length, so each text is cut before it is joined with others. A
+// cut of the joined text could remove the key that follows a signer's long name.
 void PageTable::Add(const Report& report) {
   rows_.push_back({rows_.size() + 1, report.file, report.verdict, ReasonText(report),
                    report.warnings.size(), Short(report.package_name, kMostCellText),
@@ -70,8 +68,8 @@ void PageTable::Fill(data* page) const {
   page->set("choice", OneIf(choices.size() > 1));
 }
 
-// One choice of rows for each verdict in the table, the worst first, and one for the files with
-// warnings.
+// Returns the reader's choices of rows. Each verdict in the table is one choice, the worst first.
+// If some files have warnings, the last choice has the rows of these files.
 list PageTable::Choices() const {
   const auto count = [this](const auto& is_chosen) {
     return static_cast<size_t>(std::count_if(rows_.begin(), rows_.end(), is_chosen));
@@ -120,8 +118,8 @@ size_t RankOf(Verdict verdict) {
                              std::begin(kWorstFirst));
 }
 
-// Starts with the decisive reason. If nothing was refused, but phones install the package for
-// another signer than the JAR signer, starts with that other signer. The alarms follow.
+// Starts with DecisiveReason, or with OtherOwnerText if DecisiveReason is empty. The texts of
+// AlarmFacts follow.
 std::string ReasonText(const Report& report) {
   std::vector<std::string> facts = {DecisiveReason(report)};
   if (facts[0].empty()) facts[0] = OtherOwnerText(report);

@@ -45,7 +45,8 @@ void PrintTimeline(const std::vector<TimelineLine>& lines, const Look& look, std
 
 namespace {
 
-// Paths below `directory` are shown without it.
+// In lines of the events "sign" and "verify", a path below `directory` is shown without
+// `directory`.
 Line Describe(const json& event, const std::string& directory) {
   const std::string kind = TextOf(event, "event");
   if (kind == "log") return DescribeLog(event);

@@ -25,7 +25,7 @@ enum class Group {
 enum class Severity {
   kFailed,   // there is no result for the file
   kUnseen,   // the tool left the file alone
-  kRefused,  // not signed, registered, installed or accepted, but should have been
+  kRefused,  // should be signed, registered, installed or accepted, but is not
   kFollows,  // like kRefused, but only because of another cause, which must be fixed first
   kAbsent,   // there is nothing to sign; a refusal under --strict
   kNothing,  // there is nothing to sign

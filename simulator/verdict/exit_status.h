@@ -1,4 +1,5 @@
-// The exit statuses, for scripts. For several files, the highest one counts.
+// The exit statuses of apktoolkit-sim, for scripts. A run over several files has at least the
+// highest status of these files.
 #pragma once
 
 namespace simulator {

@@ -1,6 +1,6 @@
 // The result for one file. All outputs about the file, such as the text and the journal's last
-// event, are made from it. Plain data, computed by MakeReport (make_report.h). Gate (gate.h) can
-// then add refusals.
+// event, are made from this result. MakeReport (make_report.h) computes the result. Gate (gate.h)
+// can then add refused items and change the verdict.
 #pragma once
 
 #include <cstdint>
@@ -22,7 +22,7 @@ enum class Verdict {
   kTrustedJar,
   kPartlySigned,
   kNotInstallable,  // something was signed, but not all phones install the package
-  kNotAccepted,     // everything was signed, but a further demand is not met (gate.h)
+  kNotAccepted,     // the verdict was good, but a demand of Gate (gate.h) is not met
   kRefused,
   kNotTrustedJar,
   kNotLookedAt,
@@ -44,8 +44,8 @@ enum class ItemKind {
 
 enum class ItemState {
   kDone,     // signed or registered
-  kRefused,  // not signed, registered, installed or accepted, but should have been
-  kAbsent,   // a library that is not beside the package; with --strict it is kRefused
+  kRefused,  // should be signed, registered, installed or accepted, but is not
+  kAbsent,   // a library that is not beside the package; kRefused under --strict
   kNothing   // nothing to sign
 };
 
@@ -57,12 +57,12 @@ struct Reason {
   std::string Text() const;
 };
 
-// One thing that had to be signed or registered. The kinds kEntries, kTool, kInstaller, kSigner and
-// kWarnings are for other reasons to refuse the file.
+// One thing to sign or to register, and the result. Items of the kinds kEntries, kTool, kInstaller,
+// kSigner and kWarnings are other reasons to refuse the file.
 struct Item {
   ItemKind kind;
   std::string name;   // of a library: its path below the package's directory; of a key: the
-                      // package or JAR for which it is registered
+                      // package or JAR in its registration; may be empty
   std::string entry;  // of a library: its entry in the package
   ItemState state;
   Reason reason;  // a null cause if the state is kDone
@@ -70,7 +70,8 @@ struct Item {
   bool is_verified = false;
 };
 
-// The key of the JAR signature, as the kernel and the tool know it.
+// The key whose digest the kernel got. If the kernel got no digest, the key whose digest the tool
+// would send.
 struct KernelKey {
   std::string sha256;    // of its modulus; in hexadecimal
   int bits = 0;          // 0: not known
@@ -91,7 +92,7 @@ struct Protection {
   std::vector<std::string> unlisted_names;
   Share differing = {};         // entries that do not match the manifest
   Share uncompared = {};        // listed entries that were not compared with the manifest
-  uint64_t differing_seen = 0;  // the number of differing entries at which the tool looked
+  uint64_t differing_seen = 0;  // the number of differing entries that the tool checked
   std::vector<std::string> differing_names = {};
   std::vector<std::string> missing_names = {};  // in the manifest, but not in the package
 };
@@ -102,7 +103,7 @@ enum class LinkState { kHolds, kBroken, kNotReached };
 struct Link {
   const char* name;
   LinkState state;
-  std::string text;  // the key, name or entry of the link; if it is broken, the reason
+  std::string text;  // describes the link; if the link is broken, the reason
 };
 
 struct Report {
@@ -133,9 +134,9 @@ struct Report {
 // verdict, else the first refused item. Null if nothing was refused.
 const Item* DecisiveItem(const Report& report);
 
-// Returns a signer for whom the newest phones that can install the package install it, and who is
-// not the JAR signer. Null if there is no such signer. Reads only the signer and the key of the
-// report.
+// Returns a signer for whom the newest phones install the package, but who is not the JAR signer.
+// Null if there is no such signer. "The newest phones" are those of the last range in `judgement`
+// that installs the package. Reads only the signer and the key of the report.
 const CertificateFacts* OtherSigner(const Judgement& judgement, const Report& report);
 
 // True for an item of the tool's own run. All other items are about the phones' installer or

@@ -82,7 +82,7 @@ TEST(X509Extensions, FlagOtherThanFfIsReadAsAnIdentifier) {
 }
 
 // A parser that ignored the flag's length would read FF 04 04 as the header of an element of the
-// private class. Its contents, 03 02 05 A0, are a good value.
+// private class. The contents of this element, 03 02 05 A0, are a valid KeyUsage.
 TEST(X509Extensions, FlagOfTwoBytesOnAKnownExtensionIsMinus15) {
   const Bytes rest = FromHex("04 03 02 05 a0");
   EXPECT_EQ(ResultOf(With({RawExtension(kKeyUsage, Concat({FromHex("01 01 04"), rest}))})), 0);
@@ -99,8 +99,9 @@ TEST(X509Extensions, NonzeroFlagMakesAnUnknownExtensionCritical) {
 }
 
 TEST(X509Extensions, HeaderAfterTheFlagIsReadFromTheFlagsByte) {
-  // The flag 04 and the OCTET STRING 04 03 02 05 a0 read as an OCTET STRING of the four bytes 03 02
-  // 05 a0: a BIT STRING whose first and third bits are set.
+  // The flag's value byte is 04, and the bytes after it are 04 03 02 05 a0. Together, these six
+  // bytes are an OCTET STRING with four bytes of contents: 03 02 05 a0. The contents are a BIT
+  // STRING in which the named bits 0 and 2 are set.
   const ParsedCertificate parsed(
       With({RawExtension(kKeyUsage, Concat({der::Boolean(4), FromHex("04 03 02 05 a0")}))}));
   EXPECT_EQ(parsed.result, 0);
@@ -112,12 +113,12 @@ TEST(X509Extensions, MalformedExtensionIsMinus15) {
   const Bytes cases[] = {
       der::Set({}),                                                     // no SEQUENCE
       {0x30, 0x05},                                                     // ends beyond its container
-      der::Context(16, {}),                                             // another class
+      der::Context(16, {}),                                             // tag 16 of another class
       der::Sequence({}),                                                // no OID
-      der::Sequence({value, value}),                                    // no OID either
+      der::Sequence({value, value}),                                    // no OID, but values
       RawExtension(kUnknown, {}),                                       // no value
-      RawExtension(kUnknown, der::Null()),                              // another element
-      RawExtension(kUnknown, der::ContextPrimitive(4, {})),             // a value of another class
+      RawExtension(kUnknown, der::Null()),                              // a NULL as the value
+      RawExtension(kUnknown, der::ContextPrimitive(4, {})),             // tag 4 of another class
       RawExtension(kUnknown, Concat({FromHex("01 00"), value})),        // an empty flag
       RawExtension(kUnknown, Concat({FromHex("01 02 ff ff"), value})),  // a flag of two bytes
       RawExtension(kUnknown, der::Boolean(0xff)),                       // no value after the flag
@@ -214,10 +215,11 @@ TEST(X509BasicConstraints, PathLengthIsReadWithoutCa) {
 }
 
 TEST(X509BasicConstraints, MalformedValueIsMinus15) {
-  // The first three values are no SEQUENCE: empty, of another tag, and of another class. In the
-  // next six, the first element is unreadable, neither a BOOLEAN nor an INTEGER, of another class,
-  // or a BOOLEAN whose value has two bytes or none. In the last four, the second element is
-  // unreadable, of another tag or class, or again a BOOLEAN.
+  // The first three values are not a SEQUENCE: no bytes, another tag, another class. In the next
+  // six values, the first element is wrong. It is unreadable, has another tag, has another class
+  // (two values), is a BOOLEAN with two bytes, or is a BOOLEAN without a byte. In the last four
+  // values, the second element is wrong. It is unreadable, has another tag, has another class, or
+  // is a second BOOLEAN.
   for (const char* digits :
        {"", "31 00", "b0 00", "30 01 01", "30 02 05 00", "30 03 81 01 ff", "30 03 82 01 01",
         "30 04 01 02 ff ff", "30 02 01 00", "30 04 01 01 ff 02", "30 05 01 01 ff 05 00",
@@ -308,7 +310,8 @@ TEST(X509AltName, EmptyRegisteredIdHasNoArcs) {
 }
 
 TEST(X509AltName, MalformedValueIsMinus15) {
-  // No SEQUENCE, another class, a name that cannot be read, a registeredID that ends within an arc.
+  // The first three values are not a SEQUENCE: no bytes, another tag, another class. In the next
+  // two values, the name is unreadable. In the last value, a registeredID ends within an arc.
   for (const char* oid : {kSubjectAltName, kIssuerAltName}) {
     for (const char* digits :
          {"", "31 00", "b0 00", "30 01 82", "30 02 82 05", "30 04 88 02 2a 86"}) {

@@ -29,7 +29,8 @@ Certificate Full() {
   return certificate;
 }
 
-// True if a field of the record is empty, or is inside `bytes`.
+// True if the `length` bytes at `value` are inside `bytes`. If `value` is null, true only if
+// `length` is 0.
 bool Inside(const GuardedBytes& bytes, const uint8_t* value, uint64_t length) {
   if (value == nullptr) return length == 0;
   const uint8_t* end = bytes.data() + bytes.size();
@@ -421,7 +422,7 @@ TEST(X509DamagedCertificate, TruncatedTbsCertificateFailsAndIsNotReadBeyondItsEn
   for (size_t length = header; length <= tbs.size(); ++length) {
     certificate.tbs =
         der::Sequence({Bytes(tbs.begin() + header, tbs.begin() + static_cast<ptrdiff_t>(length))});
-    // Nothing follows the tbsCertificate, so a read beyond it crashes.
+    // The tbsCertificate ends where readable memory ends, so a read beyond its end crashes.
     const ParsedCertificate parsed(der::Sequence({*certificate.tbs}));
     EXPECT_LT(parsed.result, 0) << length;
     EXPECT_TRUE(Inside(parsed.bytes, parsed.cert)) << length;

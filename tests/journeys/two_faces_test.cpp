@@ -1,7 +1,7 @@
-// Packages that other programs read differently than the tool, for example with another signer than
-// the tool finds. The key that the simulator names as the signer's is the key that the tool reads.
-// Only a warning names another key, the one that other programs find. The line of the verdict also
-// contains the alarms, which are the most serious warnings.
+// Packages that the tool and other programs read differently. For example, the tool and another
+// program find different signers. The simulator must present the tool's signer, with the key that
+// the tool reads. Only warnings may name the key that other programs find. The most serious
+// warnings, the alarms, are also in the line of the verdict.
 #include <gmpxx.h>
 #include <gtest/gtest.h>
 #include <openssl/mem.h>
@@ -26,7 +26,7 @@ using nlohmann::json;
 // some of these packages show to other programs.
 std::string VictimsDigest() { return Hex(DigestOf(Digest::kSha256, ModulusOf("rsa-2048"))); }
 
-// A key with the public exponent 65537, and how to sign with it.
+// An RSA key with the public exponent 65537. Sign makes a signature with SHA-256.
 struct OwnKey {
   mpz_class modulus;
   mpz_class secret;  // the private exponent
@@ -59,11 +59,11 @@ Package SignedAgain(Package package, Certificate certificate, const OwnKey& key)
 }
 
 // Returns a package whose certificate shows the victim's modulus. The exponent has eight bytes, and
-// the tool takes the last four (2c 01 00 00) as the modulus length: 300 in host byte order. It
-// therefore reads 300 bytes, from the start of the victim's modulus, as the modulus of the signer's
-// key. The last of these bytes belong to an extension, and are chosen so that the number is a
-// prime. Anyone can compute the private exponent for a prime modulus, so the author of the package
-// can sign. Sets `*digest` to the SHA-256 digest of this prime.
+// the tool takes the last four (2c 01 00 00) as the modulus length: 300 in host byte order. The
+// tool therefore reads 300 bytes, from the start of the victim's modulus, as the modulus of the
+// signer's key. The last of these bytes belong to an extension. They are chosen so that the 300
+// bytes are a prime number. Anyone can compute the private exponent for a prime modulus, so the
+// author of the package can sign. Sets `*digest` to the SHA-256 digest of this prime.
 Package WithAPrimeBehindTheVictimsModulus(std::string* digest) {
   constexpr size_t kSize = 300;
   Certificate certificate;
@@ -78,14 +78,14 @@ Package WithAPrimeBehindTheVictimsModulus(std::string* digest) {
     const auto at = std::search(tbs.begin(), tbs.end(), modulus.begin(), modulus.end());
     return Bytes(at, at + kSize);
   };
-  // The next prime differs from this number only in the last bytes, which are bytes of the
-  // extension.
+  // The next prime after `before` differs from `before` only in the last bytes. These bytes are in
+  // the extension.
   const Bytes before = number_read();
   OwnKey key = {0, 0, kSize};
   mpz_import(key.modulus.get_mpz_t(), kSize, 1, 1, 0, 0, before.data());
   mpz_nextprime(key.modulus.get_mpz_t(), key.modulus.get_mpz_t());
   const Bytes prime = key.Encoded(key.modulus);
-  size_t kept = 0;  // the number of free bytes that are read
+  size_t kept = 0;  // how many bytes of `free` are in the modulus that the tool reads
   while (kept < free.size()) {
     free[kept] = 0xee;
     if (number_read() == before) break;
@@ -227,7 +227,8 @@ TEST(PackageReadInTwoWays, WronglyTaggedCertificatesMakeTheBlockAmbiguous) {
   const Bytes certificate = SignatureBlock().SignerCertificate().Build();
   const auto at = std::search(block.begin(), block.end(), certificate.begin(), certificate.end());
   ASSERT_NE(at, block.end());
-  // The tool ignores this byte, the identifier octet of the certificates.
+  // This byte is the identifier octet of the block's field `certificates`. The tool ignores this
+  // byte.
   at[-4] = 0xa3;
   const Told told(package);
   EXPECT_EQ(told.status, 0);

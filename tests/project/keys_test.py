@@ -1,7 +1,8 @@
 #!/usr/bin/env python3
 """Runs each "keytool -genkeypair" command that README.md, docs/guide.md and man/apktoolkit.1 show.
 The certificate that each command makes must be signed with SHA-256. The pages also name the default
-algorithms of some JDKs. If the installed JDK is one of these JDKs, it must use these algorithms."""
+algorithms of JDK 17 and JDK 21. If JDK 17 or JDK 21 is installed, its keytool must use the
+algorithms that the pages name."""
 
 import re
 import subprocess
@@ -12,7 +13,7 @@ from sources import ROOT, report
 
 PAGES = ("README.md", "docs/guide.md", "man/apktoolkit.1")
 COMMAND = re.compile(r"keytool -genkeypair (?:.*\\\n)*.*")
-# The default signature algorithm of each JDK, by the key's length in bits.
+# JDK -> length of an RSA key in bits -> the signature algorithm that keytool uses by default.
 OWN_CHOICE = {17: {"3072": "sha256WithRSAEncryption", "3073": "sha384WithRSAEncryption"},
               21: {"2048": "sha384WithRSAEncryption"}}
 

@@ -75,8 +75,8 @@ class ChangedLibrary : public testing::Test {
     });
   }
 
-  // Repeats the change until the file's ctime is different, because a file system's clock is
-  // coarse.
+  // Repeats the change until the library's ctime is different. The clock of a file system is
+  // coarse, so a single change may leave the ctime equal.
   void UntilNoticed(const Change& change) const {
     const struct stat before = State();
     do {
@@ -124,8 +124,9 @@ class ChangedLibrary : public testing::Test {
 
 TEST_F(ChangedLibrary, UnchangedLibraryIsSignedAfterOneDigest) { ExpectSigned(1); }
 
-// --- Touched, with unchanged bytes. Each test runs once for each way in which an installer may
-// finish its work.
+// --- Touched: the library's ctime changes, but not its bytes. Each test runs four times: with
+// chmod, chown, link and utimensat. An installer may call these functions after it wrote the
+// library.
 
 class TouchedLibrary : public ChangedLibrary, public testing::WithParamInterface<const char*> {
  protected:
@@ -193,7 +194,8 @@ TEST_F(ChangedLibrary, IsSignedAsOpenedIfExchangedAfterItsSecondOpening) {
   ExpectSigned(2);
 }
 
-// The rename removes the name of the file that was read, which changes the file's ctime.
+// The rename removes the name of the file that was read. The removal changes the ctime of this
+// file, so the tool digests it a third time.
 TEST_F(ChangedLibrary, IsSignedAsReadIfExchangedAfterItsLastByte) {
   before_second_open_ = [this] { Rename("good"); };
   after_digest_[2] = [this] { Rename("evil"); };
@@ -206,7 +208,7 @@ TEST_F(ChangedLibrary, IsSignedAsReadIfExchangedBeforeTheKernelSigns) {
 }
 
 // After the second opening, the path again leads to the file that was read, and the state of that
-// file is unchanged. Only the descriptor shows the exchange.
+// file is unchanged. Only the new descriptor refers to the other file.
 TEST_F(ChangedLibrary, IsRefusedIfExchangedOnlyDuringItsSecondOpening) {
   Link("good");
   before_second_open_ = [this] { Link("evil"); };
@@ -284,8 +286,8 @@ TEST_F(ChangedLibrary, IsRefusedIfWrittenToAfterItsThirdDigest) {
   ExpectRefused(3);
 }
 
-// --- Under a lease. The tool's open breaks the lease, and the tool waits until the holder gives
-// the lease up.
+// --- Under a lease. The tool's second open of the library fails with EWOULDBLOCK, as it does if
+// another process has a lease on the library.
 
 TEST_F(ChangedLibrary, IsSignedIfLeasedAtItsSecondOpening) {
   int asked = 0;

@@ -13,7 +13,7 @@ using namespace simulator;
 
 namespace {
 
-// The options that this command line sets. The command line must be valid.
+// The options after the arguments `words` are parsed. The arguments must be valid.
 Options Parsed(Lines words) {
   Options options;
   words.insert(words.begin(), "apktoolkit-sim");

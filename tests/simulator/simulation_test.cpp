@@ -60,8 +60,8 @@ TEST(SimulatorOutput, KeepsTheOrderOfFilesThatRunAtTheSameTime) {
   EXPECT_EQ(started, files);
 }
 
-// The simulator overwrites a progress line later. It cannot do so in a pipe, so a pipe gets no
-// progress lines.
+// The simulator overwrites each progress line later. Text in a pipe cannot be overwritten, so a
+// pipe gets no progress lines.
 TEST(SimulatorOutput, ShowsNoProgressWithoutATerminal) {
   const Probe slow({"sign 3 0000", "sleep 2"});
   EXPECT_EQ(Simulated({slow.path()}).errors, "");
@@ -83,7 +83,7 @@ TEST(SimulatorOutput, ShowsProgressOnATerminalIfAFileTakesLonger) {
   EXPECT_NE(verdict, std::string::npos) << result.output;
 }
 
-// https://no-color.org: the variable counts if it is present and not empty.
+// NO_COLOR takes effect if it is set and not empty (https://no-color.org).
 TEST(SimulatorOutput, HasNoColoursIfNoColorIsSet) {
   if (RunProcess({"script", "-qec", "true", "/dev/null"}).status != 0) {
     GTEST_SKIP() << "there are no pseudo-terminals here: /dev/pts is not mounted";
@@ -245,7 +245,9 @@ TEST(Simulation, HasNoResultForAFileThatWasChangedMeanwhile) {
   EXPECT_EQ(Told({"--quiet", directory.path()}).status, 1);
 }
 
-// Each run makes and removes a hard link to the file, for its own installation.
+// Each run installs the package in a directory of its own. If the file system allows it, the run
+// makes a hard link to the file there, and later removes the link. Both actions change the file's
+// ctime.
 TEST(Simulation, ParallelRunsOverOneFileDoNotDisturbEachOther) {
   const TempDir directory;
   PackageOptions options;
@@ -264,7 +266,8 @@ TEST(Simulation, ParallelRunsOverOneFileDoNotDisturbEachOther) {
   EXPECT_EQ(result.status, 0);
 }
 
-// The tool and the simulator map the central directory, and the test cuts it off again and again.
+// The tool and the simulator map the file's central directory. Meanwhile, the script repeatedly
+// cuts the file off before its central directory, and restores the file.
 TEST(Simulation, SurvivesAFileThatShrinksAndGoesOnToTheNext) {
   PackageOptions options;
   for (int i = 0; i < 20000; ++i) options.entries.push_back({"assets/" + std::to_string(i), {}});

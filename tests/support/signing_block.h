@@ -24,9 +24,9 @@ Bytes Signers(const std::vector<Bytes>& signers);
 // The block of these pairs of scheme and value: size, pairs, size again, magic.
 Bytes SigningBlockBytes(const std::vector<std::pair<uint32_t, Bytes>>& pairs);
 // The archive with two additions: `block` before its central directory, and `comment` (at most 255
-// characters) at its end. The archive must not have a comment.
+// bytes) at its end. `archive` itself must not have a comment.
 Bytes ArchiveWithBlock(const Bytes& archive, const Bytes& block, const std::string& comment = "");
 
-// The archive, signed with scheme v2 by the RSA test key `key`: the block covers all bytes of the
-// file except its own. The archive must have neither a block nor a comment.
+// The archive, signed with scheme v2 by the RSA test key `key`. The signature covers all bytes of
+// `archive`, which must have neither a block nor a comment.
 Bytes AddSigningBlock(const Bytes& archive, const std::string& key);

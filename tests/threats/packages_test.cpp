@@ -51,12 +51,13 @@ INSTANTIATE_TEST_SUITE_P(Rsa, ApksignerKey,
                                          "rsa-2048-e17", "rsa-2048-other", "rsa-3072", "rsa-4096"),
                          NameOf);
 
-// ---- If a package has an APK signing block, the installer checks only that block. Only this tool
-// checks META-INF.
+// ---- Packages with the victim's META-INF. The Android manifest and the APK signing block are the
+// attacker's.
 
 class ForeignMetaInf : public testing::TestWithParam<const char*> {
  protected:
-  // The package with the attacker's own APK signing block, and with its libraries beside it.
+  // Writes the package again, with the attacker's APK signing block. Copies the package's libraries
+  // beside the new file.
   ForeignMetaInf() : apk_(directory_ / "base.apk") {
     std::filesystem::copy(std::filesystem::path(Made(GetParam())).parent_path() / "lib",
                           directory_ / "lib", std::filesystem::copy_options::recursive);
@@ -101,8 +102,8 @@ TEST(OwnMetaInf, GetsItsOwnPayload) {
 
 // ---- The tool compares only the local names of attributes.
 
-// The installer reads the name com.evil.reader. The package requests no permission: it declares
-// one.
+// The tool reads the package's name from x:package. The installer reads it from package. The tool
+// registers the key although the package only declares the permission and does not request it.
 TEST(AttributeInAnotherNamespace, NamesAnotherPackageThanTheInstallerReads) {
   const std::string apk = Made("attribute");
   const ProcessResult installer = RunProcess({"aapt", "dump", "permissions", apk});

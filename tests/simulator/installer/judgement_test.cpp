@@ -10,7 +10,8 @@ namespace {
 
 std::string Hexadecimal(const Bytes& bytes) { return Hex(bytes); }
 
-// An answer with one range, whose members "verified", "signers" and "errors" have these values.
+// An answer with one range of API levels. The range's members "verified", "signers" and "errors"
+// have these values.
 std::string Answer(const std::string& verified, const std::string& signers,
                    const std::string& errors) {
   return R"({"ranges":[{"first":27,"last":2147483647,"verified":)" + verified +
@@ -91,8 +92,7 @@ TEST(Judgement, SignerWithAnUnreadableCertificateIsNoAnswer) {
             "the crypto library does not read the certificate of the v2 signer");
 }
 
-// Without this check, a package could be installable with errors or without a signer, or refused
-// without an error.
+// A verified range must have a signer and no errors. A refused range must have an error.
 TEST(Judgement, AnswerThatContradictsItselfIsNoAnswer) {
   EXPECT_EQ(WhyNone(Answer("true", kSigner, kError)), "its answer is malformed");
   EXPECT_EQ(WhyNone(Answer("true", "[]", "[]")), "its answer is malformed");

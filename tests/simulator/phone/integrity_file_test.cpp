@@ -55,7 +55,7 @@ TEST(IntegrityFile, MayHoldWhatIsNoNumber) {
 
 TEST(IntegrityFile, MayBeEmpty) {
   const ProbeRun run = Probe({"fopen " + kOwn + " r"}).Run({"--integrity", ""});
-  EXPECT_EQ(run.results, Lines({"-2 0"}));  // errno after fscanf met the end of the file
+  EXPECT_EQ(run.results, Lines({"-2 0"}));  // fscanf reached the end of the file; errno is then 0
   EXPECT_EQ(OfKind(run.events, "integrity"), std::vector<Json>({IntegrityEvent(0, "")}));
 }
 

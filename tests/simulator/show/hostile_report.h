@@ -1,4 +1,5 @@
-// A report in which every text that a hostile file controls contains the same text.
+// A report for tests. Each text that a hostile file can control contains the text that the test
+// passes to HostileReport.
 #pragma once
 
 #include <string>
@@ -8,8 +9,9 @@
 
 namespace simulator {
 
-// The text of a hostile file: markup for every place of a page, control sequences, bytes that are
-// not UTF-8, characters that change the direction of the text, and marks of the page's template.
+// A hostile text. It has HTML that tries to end an element, an attribute or a comment of the page.
+// It also has tags of the page's Mustache template, control sequences of a terminal, bytes that are
+// not UTF-8, and characters that change the direction of the text.
 inline const char kHostileText[] =
     "</title></style><script>document.title='hostile'</script><img src=x onerror=alert(1)>"
     "\"'><a href='javascript:alert(1)'>&lt;&{{verdict}}{{{verdict}}}{{&verdict}}-->"
