@@ -21,9 +21,9 @@ TOOL, FLOOR, PEER = (f'{BUILD}/bin/{name}' for name in ('apktoolkit', 'bench_flo
 MICRO = [f'{BUILD}/bench/bench_micro', f'{BUILD}/bench/bench_micro_openssl']
 DOCUMENT = 'docs/performance.md'
 
-# rounds: how often each program runs. floor, peer: the greatest allowed ratio of the tool's time to
-# that program's time. memory: the greatest allowed ratio of the tool's memory to the floor's. None:
-# no target. margin: the fraction of the target by which each ratio may exceed the target.
+# rounds: how often each program runs. floor, peer: the target for the ratio of the tool's time to
+# that program's time. memory: the target for the ratio of the tool's memory to the floor's. None: no
+# target. margin: a ratio misses its target only if it is greater than target * (1 + margin).
 Package = collections.namedtuple('Package', 'name rounds floor peer memory margin')
 PACKAGES = [
     Package('small', 101, 1.07, 0.90, 1.03, 0.05),
@@ -88,9 +88,9 @@ def measure(package):
 
 
 def expect_same_log(package):
-    """Exits if the logs of the three programs differ in more than times and process numbers. Also
-    exits if the log has no signing step with the result 65536, which means that the step failed.
-    The step must fail, because the kernel of a workstation has no integrity feature."""
+    """Exits if the logs of the three programs differ in more than times and process numbers. The
+    signing step must fail, because the kernel of a workstation has no integrity feature. The log
+    reports this failure as the result 65536. Also exits if the log does not have this result."""
     logs = {re.sub(r'\d\d-\d\d \d\d:\d\d:\d\d +\d+ +\d+', '', subprocess.run(
         [program, package_path(package.name)], check=True, capture_output=True, text=True).stderr)
         for program in (TOOL, FLOOR, PEER)}

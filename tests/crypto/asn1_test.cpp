@@ -134,8 +134,8 @@ TEST(Asn1GetNext, LongFormTagMayHaveOneOctet) {
 TEST(Asn1GetNext, LongFormTagKeepsItsLow32Bits) {
   // The tag number has ten octets with seven bits each. The low 32 bits are 0x11223344, and all
   // higher bits are ones. In groups of seven bits, 0x11223344 is 0001 0001001 0001000 1100110
-  // 1000100. The first group has only four bits. The three bits above complete it with ones:
-  // 1110001. With the continuation bit, this is the octet 0xf1.
+  // 1000100. The first group has only four bits. The three next higher bits, which are ones,
+  // complete the group: 1110001. With the continuation bit, this is the octet 0xf1.
   asn1_hdr hdr;
   EXPECT_EQ(Read(FromHex("1f ff ff ff ff ff f1 89 88 e6 44 00"), &hdr), 0);
   EXPECT_EQ(hdr.tag, 0x11223344u);

@@ -365,7 +365,7 @@ TEST(ProcessCertKey, ExponentIsFilledWithZerosEvenInAUsedRecord) {
 }
 
 TEST(ProcessCertKey, LongerExponentOverwritesTheModulusLength) {
-  // The modulus length is 64, 40 00 00 00 in memory.
+  // The modulus length is 64. Its bytes in memory are 40 00 00 00 (hexadecimal).
   const std::pair<const char*, const char*> cases[] = {
       {"11 22 33 44 55", "11 22 33 44 55 00 00 00"},
       {"11 22 33 44 55 66 77 88", "11 22 33 44 55 66 77 88"}};
