@@ -128,7 +128,8 @@ bool ReadPublicKey(const Block& block, const x509_certificate& certificate, pkcs
   record->modulus_length = modulus.length - zeros;
 
   // Deliberate: the exponent, header included, may be as long as the contents of the modulus. The
-  // end of the key is no limit. The exponent is copied, so its contents must be inside the block.
+  // end of the key does not limit it. The exponent is copied, so its contents must be inside the
+  // block.
   asn1_hdr exponent;
   if (!block.Read(block.Skip(modulus), modulus.length, &exponent)) return Fail(kUnreadable);
   if (exponent.tag != kAsn1Integer) return Fail(kNotAnInteger);

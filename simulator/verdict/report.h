@@ -143,7 +143,7 @@ const CertificateFacts* OtherSigner(const Judgement& judgement, const Report& re
 // about a demand that is not met (gate.h).
 bool IsByTool(const Item& item);
 
-// True for a file that was signed in this run. A registered key is no file.
+// True for a file that was signed in this run; false for a registered key.
 bool IsSigned(const Item& item);
 
 // The exit status for a verdict.
