@@ -88,7 +88,10 @@ std::optional<int> ParseOptions(int argc, char** argv, Options* options) {
   try {
     app.parse(CommandLineOf(argc, argv));
     if (options->verify && options->run.install == InstallWhen::kAlways) {
-      throw CLI::ExcludesError("--verify", kInstall);
+      throw CLI::ExcludesError(kInstall, "--verify");
+    }
+    if (options->verify && options->installer.use == InstallerUse::kRequired) {
+      throw CLI::ExcludesError("--installer=required", "--verify");
     }
   } catch (const CLI::ParseError& error) {
     return app.exit(error) == 0 ? 0 : kUsageError;
@@ -324,15 +327,16 @@ void AddRun(CLI::App* app, Options* options, std::string* runner) {
       ->take_last();
 }
 
-// With --verify, nothing is signed and there are no verdicts. --verify therefore excludes the
-// options about verdicts. It also excludes --recursive.
+// With --verify, nothing is signed, and there are no registrations and no verdicts. --verify
+// therefore excludes the options about these. It also excludes --recursive.
 void AddVerify(CLI::App* app, Options* options) {
   CLI::Option* const verify = app->add_flag("--verify", options->verify,
                                             "Sign nothing. Run the apktoolkit-verify beside\n"
                                             "this program: it asks which FILEs the kernel\n"
                                             "trusts");
-  for (const char* name : {"--signer", "--werror", "--strict", "--recursive", "--quiet",
-                           "--verbose", "--html", "--junit", "--sarif"}) {
+  for (const char* name :
+       {"--integrity", "--sign-errno", "--zu-result", "--api", "--signer", "--werror", "--strict",
+        "--recursive", "--quiet", "--verbose", "--html", "--junit", "--sarif"}) {
     verify->excludes(app->get_option(name));
   }
   verify->option_text(" ");  // replaces the list of excluded options, which is too long for a line

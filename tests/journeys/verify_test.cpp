@@ -212,10 +212,15 @@ TEST(VerifyOutput, IsAFailureIfItCannotBeWritten) {
 // ---- The simulator's option --verify.
 
 TEST(SimulatorVerify, ExcludesTheOptionsForSigning) {
-  for (const char* option : {"--install", "--strict", "--quiet", "--verbose", "--html=page"}) {
+  for (const std::string option :
+       {"--install", "--strict", "--recursive", "--quiet", "--verbose", "--werror", "--html=page",
+        "--junit=results", "--sarif=log", "--integrity=1f", "--sign-errno=EPERM", "--zu-result=1",
+        "--installer=required", "--api=30"}) {
     const ProcessResult run = Verify({option, "/dev/null"});
     EXPECT_EQ(run.status, 2) << option;
-    EXPECT_NE(run.errors.find("excludes"), std::string::npos) << run.errors;
+    const bool needs_value = option == "--installer=required";
+    const std::string name = needs_value ? option : option.substr(0, option.find('='));
+    EXPECT_EQ(run.errors.find(name + " excludes --verify\n"), 0U) << run.errors;
   }
 }
 
