@@ -40,7 +40,10 @@ void RunInOrder(size_t count, unsigned jobs, const std::function<void(size_t num
     while (!has_run[i] && !is_never_run()) {
       finished.wait_for(lock, kNowAndThen);
       const auto passed = std::chrono::duration_cast<std::chrono::seconds>(Clock::now() - start);
-      if (!has_run[i] && passed.count() > 0) waiting(i, static_cast<int>(passed.count()));
+      if (has_run[i] || passed.count() == 0) continue;
+      lock.unlock();
+      waiting(i, static_cast<int>(passed.count()));
+      lock.lock();
     }
     if (!has_run[i]) break;
     lock.unlock();
