@@ -129,17 +129,21 @@ constexpr Reader kReaders[] = {
      std::size(kDocuments)},
 };
 
-// The peak memory of the process since ResetPeak, in KiB; 0 if it is not known.
+// The peak memory of the process since ResetPeak, in KiB. Ends the process if it is not known.
 long PeakKilobytes() {
   std::ifstream status("/proc/self/status");
   for (std::string word; status >> word;) {
     if (long kilobytes; word == "VmHWM:" && status >> kilobytes) return kilobytes;
   }
-  return 0;
+  _exit(1);
 }
 
-// Resets the peak, so that the memory that was used to make the text does not count.
-void ResetPeak() { std::ofstream("/proc/self/clear_refs") << "5"; }
+// Resets the peak, so that the memory that was used to make the text does not count. Ends the
+// process if this is not possible.
+void ResetPeak() {
+  std::ofstream file("/proc/self/clear_refs");
+  if (!(file << "5" << std::flush)) _exit(1);
+}
 
 void Measure(const Reader& reader, const Text& text) {
   using Clock = std::chrono::steady_clock;
