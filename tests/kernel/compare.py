@@ -159,7 +159,7 @@ def summary(expected, run):
             if event["result"] != 0:
                 answer = f"{event['event']}: {runs.error_name(event['errno'])}"
         elif event["event"] == "register":
-            answer = "registered"
+            answer = "registered" if event["result"] == 0 else f"register: {event['result']}"
         else:
             continue
         answers[answer] = answers.get(answer, 0) + 1
