@@ -37,7 +37,7 @@ using Layout = std::map<std::string, std::string>;
 std::vector<std::string> LibraryNames(const Archive& archive);
 bool LiesAlone(int package, const std::vector<std::string>& libraries);
 Layout PlanLayout(const std::vector<std::string>& entries, InstalledAbi choice,
-                  std::vector<std::string>* left_out, std::set<std::string>* of_other_processors);
+                  std::vector<std::string>* left_out, std::set<std::string>* of_other_abis);
 bool IsNameForInstallers(const std::string& entry);
 bool Wants(InstalledAbi choice, bool is_arm64, bool has_arm64);
 bool PutPackage(const std::string& file, int source, const std::string& copy,
@@ -69,7 +69,7 @@ std::optional<std::string> Installation::LayOut(const std::string& file, Install
   if (ParseAndroidManifest(manifest).extracts_libraries == false) return {};
   const std::vector<std::string> libraries = LibraryNames(archive);
   if (when == InstallWhen::kAlone && !LiesAlone(source.get(), libraries)) return {};
-  const Layout layout = PlanLayout(libraries, abi, &left_out_, &of_other_processors_);
+  const Layout layout = PlanLayout(libraries, abi, &left_out_, &of_other_abis_);
   if (layout.empty()) return {};
 
   std::string directory = fs::temp_directory_path(error).string() + "/apktoolkit-sim.XXXXXX";
@@ -155,7 +155,7 @@ bool LiesAlone(int package, const std::vector<std::string>& libraries) {
 // processor, an installer uses only one ABI: the first in kPhoneAbis for which the package has
 // libraries.
 Layout PlanLayout(const std::vector<std::string>& entries, InstalledAbi choice,
-                  std::vector<std::string>* left_out, std::set<std::string>* of_other_processors) {
+                  std::vector<std::string>* left_out, std::set<std::string>* of_other_abis) {
   Layout layout;
   std::set<std::string> taken;  // directories for libraries that are in `layout`
   for (const char* const abi : kPhoneAbis) {
@@ -171,7 +171,7 @@ Layout PlanLayout(const std::vector<std::string>& entries, InstalledAbi choice,
         layout.emplace(ApkTools::InstalledLibraryPath("", entry), entry);
         taken.insert(installed);
       } else {
-        of_other_processors->insert(entry);
+        of_other_abis->insert(entry);
       }
     }
   }

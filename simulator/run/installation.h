@@ -56,7 +56,7 @@ class Installation {
   std::string WithStablePaths(const std::string& journal) const;
   // The entries of libraries that were not laid out, because they belong to an Arm ABI that was not
   // chosen.
-  const std::set<std::string>& of_other_processors() const { return of_other_processors_; }
+  const std::set<std::string>& of_other_abis() const { return of_other_abis_; }
   // The library entries whose names no installer accepts.
   const std::vector<std::string>& left_out() const { return left_out_; }
   // The chosen library entries that cannot be extracted.
@@ -66,7 +66,7 @@ class Installation {
   std::string directory_;
   std::string path_;
   bool is_done_ = false;
-  std::set<std::string> of_other_processors_;
+  std::set<std::string> of_other_abis_;
   std::vector<std::string> left_out_;
   std::vector<std::string> not_extracted_;
 };

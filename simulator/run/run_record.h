@@ -90,9 +90,9 @@ struct RunRecord {
   bool has_standard_input = true;  // the tool was started with a standard input
   bool has_no_packages = false;    // a directory without packages; the tool was not run
   // Library entries that Installation did not extract:
-  std::set<std::string> of_other_processors;  // entries of Arm ABIs that were not chosen
-  std::vector<std::string> not_laid_out;      // entries whose names no installer accepts
-  std::vector<std::string> not_extracted;     // entries that cannot be extracted
+  std::set<std::string> of_other_abis;     // entries of Arm ABIs that were not chosen
+  std::vector<std::string> not_laid_out;   // entries whose names no installer accepts
+  std::vector<std::string> not_extracted;  // entries that cannot be extracted
 
   // The path by which the events name the file.
   const std::string& PathForTool() const { return installed.empty() ? path : installed; }

@@ -114,7 +114,7 @@ FileRun Simulator::Run(const ListedFile& listed) {
   run.record.failure = task.failure;
   run.record.tool = {options_.is_own_tool, tool_sha256_};
   run.record.has_standard_input = has_standard_input_;
-  run.record.of_other_processors = installation.of_other_processors();
+  run.record.of_other_abis = installation.of_other_abis();
   run.record.not_laid_out = installation.left_out();
   run.record.not_extracted = installation.not_extracted();
   // A run that cannot be judged needs no facts.

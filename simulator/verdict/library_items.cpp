@@ -144,7 +144,7 @@ Reason WhyNotThere(const LibraryFacts& library, const RunRecord& run, const Pack
   if (std::count(library.place.begin(), library.place.end(), '/') > 2) {
     return {&cause::kLibraryInSubdirectory, library.place};
   }
-  if (run.of_other_processors.count(library.entry) > 0) return {&cause::kLibraryNotLaidOut, ""};
+  if (run.of_other_abis.count(library.entry) > 0) return {&cause::kLibraryNotLaidOut, ""};
   return {library.has_directory ? &cause::kLibraryMissing : &cause::kLibraryNotInstalled, ""};
 }
 

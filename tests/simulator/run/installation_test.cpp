@@ -361,14 +361,14 @@ TEST(Installation, LeavesAJarWithLibrariesWhereItIs) {
   EXPECT_EQ(installation.path(), file);
 }
 
-TEST(Installation, NamesTheLibrariesOfOtherProcessors) {
+TEST(Installation, NamesTheLibrariesOfAbisNotChosen) {
   const TempDir directory;
   const std::string file = directory / "base.apk";
   MakePackage(WithLibraries(kBoth)).WriteTo(file);
   const auto others = [&file](InstalledAbi abi) {
     Installation installation;
     EXPECT_EQ(installation.LayOut(file, InstallWhen::kAlways, abi, kLater), std::nullopt);
-    return installation.of_other_processors();
+    return installation.of_other_abis();
   };
   EXPECT_EQ(others(InstalledAbi::kPreferred),
             std::set<std::string>({"lib/armeabi-v7a/liba.so", "lib/armeabi/liba.so"}));
