@@ -33,7 +33,7 @@ TEST(Queue, ResultsAreDeliveredInTheOrderOfTheNumbers) {
   EXPECT_EQ(results, std::vector<size_t>({0, 1, 2, 3}));
 }
 
-TEST(Queue, WithoutNumbersNothingIsCalled) {
+TEST(Queue, CallsNothingIfThereAreNoNumbers) {
   const auto never = [](size_t number) { ADD_FAILURE() << number; };
   RunInOrder(0, 2, never, never, Ignore);
 }
