@@ -96,7 +96,9 @@ class ManifestSections {
   void endSection();
 
  private:
-  // After a sort, add() sorts the same section again only after at least this many bytes of text.
+  // add() also sorts the open section from time to time, so that repeated names do not fill the
+  // memory. Before each such sort, at least this many bytes of text follow the section's start or
+  // its last sort.
   static constexpr size_t kLittleText = 1024;
 
   size_t openStart() const { return ends_.empty() ? 0 : ends_.back(); }

@@ -130,8 +130,8 @@ std::vector<std::string> LibraryNames(const Archive& archive) {
 // True if nothing was installed beside the package: the installer's directories, such as lib/arm64,
 // do not exist, and nothing is at the paths where the tool looks for libraries. Like the tool, this
 // function looks beside the open file, not beside a link to it. Returns false for a file on a
-// read-only file system, because the tool does not sign there. Also returns false if the file's
-// path or file system cannot be determined.
+// read-only file system: the tool does not sign there, and a copy in another place would hide this.
+// Also returns false if the file's path or file system cannot be determined.
 bool LiesAlone(int package, const std::vector<std::string>& libraries) {
   const std::string file = GetFilenameByFd(package);
   struct statvfs system = {};

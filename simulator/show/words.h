@@ -50,8 +50,8 @@ std::vector<std::string> AlarmFacts(const Report& report);
 // The reason of the item that decides the verdict; empty if nothing was refused.
 std::string DecisiveReason(const Report& report);
 
-// If the verifier of the phones' installer is missing, returns a message that reports this. Else
-// returns an empty text.
+// If apksig, the verifier that phones' installers use, is missing on this computer, returns a
+// message with the reason. Else returns an empty text.
 std::string MissingInstaller(const Report& report);
 
 // The facts after the file's name in the verdict's line, in this order:
@@ -61,7 +61,8 @@ std::string MissingInstaller(const Report& report);
 // - the number of all warnings, unless it is 0.
 std::vector<std::string> HeadFacts(const Report& report, const char* ellipsis);
 
-// The mark before the line of an item or of a link.
+// The mark before the line of an item, or of a link in the chain from the key to the entries (Link
+// in report.h).
 enum class Mark { kGood, kBad, kNeither };
 
 Mark MarkOf(ItemState state);
