@@ -1,4 +1,5 @@
-"""Two plots as SVG, drawn by hand: one of lines over logarithmic axes, one of stacked bars."""
+"""Writes two kinds of plots as SVG files, without a plotting library: lines over logarithmic axes,
+and stacked bars."""
 
 import math
 
@@ -7,7 +8,8 @@ FONT = 'font-family="sans-serif" font-size="13"'
 
 
 def write_growth(path, lines):
-    """`lines`: points (entries, milliseconds) by name."""
+    """`lines` maps the name of each program to its points: (number of entries, processor time in
+    milliseconds)."""
     width, height, left, bottom, top, right = 720, 420, 70, 360, 30, 600
     xs = [x for points in lines.values() for x, _ in points]
     ys = [y for points in lines.values() for _, y in points]
@@ -38,7 +40,8 @@ def write_growth(path, lines):
 
 
 def write_parts(path, bars):
-    """`bars`: shares by part, by package."""
+    """`bars` maps the name of each package to a second map: from the name of each part of a run to
+    its share of the processor time (0 to 1)."""
     width, left, right, row, top = 720, 120, 700, 34, 60
     parts = []
     names = list(next(iter(bars.values())))

@@ -1,7 +1,7 @@
 #!/usr/bin/env python3
-"""check_phone.py PROGRAMS GOLDEN: compares integration/phone and METADATA with the blueprints.
-Tries try-on-phone with a stand-in for adb (tests/phone/adb), on phones that work and on phones
-that do not.
+"""check_phone.py PROGRAMS GOLDEN: compares integration/phone with the blueprints (Android.bp
+files), and METADATA with metadata.proto and CHANGES.md. Tries try-on-phone with a stand-in for adb
+(tests/phone/adb), on phones that work and on phones that do not.
 
 PROGRAMS is the directory of the built programs. GOLDEN is the directory of the golden packages.
 """
@@ -30,7 +30,7 @@ def modules(path, kind):
 
 
 def check_makefile():
-    """A product's makefile gets exactly the programs that the blueprint builds."""
+    """A product's makefile gets exactly the programs that Android.bp builds."""
     text = f"include {KIT}/apktoolkit.mk\n$(info $(PRODUCT_PACKAGES))\nall:;@:\n"
     result = subprocess.run(["make", "--silent", "-f", "-"], input=text, text=True, check=True,
                             stdout=subprocess.PIPE)
@@ -39,8 +39,8 @@ def check_makefile():
 
 
 def check_service():
-    """The service's program is installed, together with the service. The service does not start
-    itself."""
+    """Android.bp installs the service together with its program. init starts the service only on
+    request, and does not restart it when it ends."""
     lines = [line.split() for line in (KIT / "apktoolkit.rc").read_text().splitlines()
              if line and not line.startswith("#")]
     problems = []
@@ -50,12 +50,13 @@ def check_service():
         problems.append("apktoolkit.rc: the service would start by itself, or again and again")
     owner = modules(ROOT / "Android.bp", "cc_binary")["apktoolkit-all"]
     if owner.get("init_rc") != ["integration/phone/apktoolkit.rc"]:
-        problems.append("Android.bp: apktoolkit-all does not bring its service")
+        problems.append("Android.bp: apktoolkit-all does not install its service")
     return problems
 
 
 def check_tests():
-    """Each test of the blueprint is pushed, and runs in the directory that it was pushed to."""
+    """AndroidTest.xml pushes each test of tests/Android.bp to the phone, and runs the tests in the
+    directory to which it pushes them."""
     tree = xml.etree.ElementTree.parse(KIT / "AndroidTest.xml")
     options = [(option.get("name"), option.get("value")) for option in tree.iter("option")]
     pushed = {value for name, value in options if name == "push"}
@@ -67,13 +68,13 @@ def check_tests():
     if pushed != {f"{name}->/data/local/tmp/{name}" for name in built}:
         problems.append(f"AndroidTest.xml pushes {pushed}")
     if {value for name, value in options if name == "native-test-device-path"} != {"/data/local/tmp"}:
-        problems.append("AndroidTest.xml runs the tests from elsewhere than it pushes them to")
+        problems.append("AndroidTest.xml does not run the tests in /data/local/tmp")
     return problems
 
 
 def check_license():
-    """The blueprints, with the lines that a tree of Android 12 appends, have one license for all
-    modules."""
+    """For trees of Android 12 and later, license.bp and package.bp are appended to Android.bp.
+    Android.bp then has one license for all of its modules, and the license's text exists."""
     problems = []
     with tempfile.TemporaryDirectory(dir=ROOT / "build") as name:
         both = pathlib.Path(name) / "Android.bp"
@@ -93,7 +94,8 @@ def modules_of(path, kind):
 
 
 def check_metadata():
-    """METADATA has the right form, and the version and day of the newest heading in CHANGES.md."""
+    """METADATA has the form of metadata.proto. Its version and day are those of the newest heading
+    in CHANGES.md."""
     with (ROOT / "METADATA").open() as metadata:
         result = subprocess.run(["protoc", f"--proto_path={HERE}", "--encode=Metadata",
                                  HERE / "metadata.proto"], stdin=metadata, capture_output=True, check=False)
@@ -109,8 +111,8 @@ def check_metadata():
 
 
 def trial(programs, package, mood=""):
-    """Runs try-on-phone on a new phone. Returns its status, its output, and the files that it left
-    on the phone."""
+    """Runs try-on-phone on a new phone, with `mood` as its STUB_MOOD (tests/phone/adb). Returns the
+    exit status, the output, and the files that try-on-phone left on the phone."""
     with tempfile.TemporaryDirectory() as name:
         phone = pathlib.Path(name) / "phone"
         built = pathlib.Path(name) / "system"

@@ -35,7 +35,8 @@ def examples(page):
 
 
 def run_examples(page, package, simulator):
-    """The examples that print nothing, print an error, or end with a status other than 0 and 1."""
+    """Runs the page's examples. Returns a problem for each example that prints no result, prints an
+    error, or ends with a status above 1. Returns a problem if the page has no examples."""
     problems = []
     with tempfile.TemporaryDirectory() as name:
         directory = pathlib.Path(name)

@@ -1,9 +1,9 @@
 #!/usr/bin/env python3
-"""Runs scripts/demo, and compares README.md's excerpt with its output.
+"""Runs scripts/demo, and compares its output with the excerpt in README.md.
 
-Arguments: the command of the built apktoolkit-sim. A line of three dots on the page stands for
-lines that are left out. The number of the changed byte and its value depend on the library's
-compiler.
+Argument: the path of the apktoolkit-sim that scripts/demo uses. In the excerpt, a line of three
+dots stands for lines that are left out. The position and the values of the changed byte depend on
+the library's compiler, so the test ignores them.
 """
 
 import os
@@ -22,7 +22,7 @@ def settled(text):
 
 
 def pattern(shown):
-    """A regular expression for the page's excerpt that the whole output matches."""
+    """The excerpt as a regular expression, which must match the whole output."""
     parts = (re.escape(line + "\n") if line != "..." else r"(?:.*\n)*?" for line in shown)
     return "".join(parts)
 

@@ -1,6 +1,9 @@
 #!/usr/bin/env python3
-"""Writes debian/changelog from CHANGES.md. Runs scripts/release in a repository with good and bad
-tags, in which stand-ins install nothing and build no real packages. Argument: the build's version.
+"""Compares debian/changelog with CHANGES.md. With --write as the first argument, rewrites
+debian/changelog instead. Runs scripts/release in a new repository with good and bad tags. In this
+repository, stand-ins replace scripts/setup and scripts/reproducible. The stand-ins install nothing
+and build no real packages. The last argument is the build's version. The newest heading of
+CHANGES.md must have this version.
 """
 
 import os
@@ -21,7 +24,7 @@ BUILDER = 'mkdir -p build/package && git rev-parse HEAD >build/package/tool.deb'
 def version_problems(version):
     newest = re.search(r"^## (\S+),", (ROOT / "CHANGES.md").read_text(), re.M)[1]
     if newest != version:
-        yield f"CHANGES.md is of {newest}, and {version} is built"
+        yield f"the newest heading of CHANGES.md is of {newest}, but {version} is built"
 
 
 class Repository:
@@ -38,7 +41,8 @@ class Repository:
             script.write_text(f"#!/bin/bash\n{content}\n")
             script.chmod(0o755)
         (directory / ".gitignore").write_text("/build/\n/gpg/\n/.gitconfig\n")
-        (directory / ".gitconfig").write_text("[tar]\n\tumask = user\n")  # a setting of the user
+        # scripts/release must not use this setting of the user.
+        (directory / ".gitconfig").write_text("[tar]\n\tumask = user\n")
         self.run("gpg", "--batch", "--quiet", "--passphrase", "", "--quick-generate-key",
                  "A <a@example.com>", "ed25519", "sign")
         self.run("git", "init", "--quiet")
@@ -98,12 +102,12 @@ def release_problems(repository):
     if found != ["SHA256SUMS", "apktoolkit-1.2.3.tar.gz", "tool.deb"]:
         problems.append(f"the release has {found}")
     if (out / "apktoolkit-1.2.3.tar.gz").read_bytes()[3:8] != bytes(5):
-        problems.append("the head of gzip's file has a name or a time")
+        problems.append("the tarball's gzip header has a file name or a time")
     with tarfile.open(out / "apktoolkit-1.2.3.tar.gz") as tarball:
         if tarball.extractfile("apktoolkit-1.2.3/CHANGES.md").read().decode() != RELEASED:
-            problems.append("the tarball does not have what the tag has")
+            problems.append("CHANGES.md in the tarball is not that of the tag")
     if (out / "tool.deb").read_text() != repository.run("git", "rev-parse", "v1.2.3^{commit}"):
-        problems.append("the package is not of the tag")
+        problems.append("tool.deb was not built from the tag's commit")
     return problems
 
 

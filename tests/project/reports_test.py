@@ -157,7 +157,8 @@ def main():
                     problems.append(f"the log has no artifact for {file!r}")
         if seen != {0, 1, 3, 4}:
             problems.append(f"the statuses are {seen}, and not 0, 1, 3 and 4")
-    return report(problems)
+    return report(problems, "simulator/show/junit.cpp, simulator/show/sarif.cpp; for another property of the standard, "
+                            "also SARIF in tests/project/reports_test.py")
 
 
 if __name__ == "__main__":

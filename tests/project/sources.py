@@ -1,8 +1,9 @@
-"""Functions that the tests of this directory share: they read the project's own files and report the
-result.
+"""Code that the tests of this directory share. It reads the project's own files, runs commands, and
+reports problems.
 
-These tests compare tables in the docs with the sources. With --write as its first argument, a test
-rewrites its tables instead. A test that fails prints the command to run or the file to fix.
+Some tests generate the text of a file or parts of it, for example a table in the docs, and compare
+the file with this text. With --write as the first argument, these tests rewrite the file instead.
+A test that finds a problem prints the command to run or the file to fix.
 """
 
 import difflib
@@ -61,17 +62,19 @@ def changed_zip(archive, change, out):
 
 
 def shown_commands(block):
-    """The commands of a block "$ COMMAND", each with the lines that it prints on the page."""
+    """Yields each command of a block on a page, with the output that the page shows for it. In the
+    block, the line of a command begins with "$ "."""
     for part in re.split(r"^\$ ", block, flags=re.M)[1:]:
         command, *expected = part.splitlines()
         yield command, expected
 
 
-def report(problems, fix="", pages=None):
+def report(problems, fix, pages=None):
     """Prints the problems and how to fix them. Returns the exit status of the test.
 
-    `fix`: the file or the command that fixes the problems. `pages`: a map from the path of each page
-    with generated parts to its correct text.
+    `fix`: the file to fix, or the command to run, if there are problems. `pages`: a map from the
+    path of each file with generated text to the whole correct text of the file. If a file has
+    another text, prints the difference. With --write, rewrites the file instead.
     """
     problems, stale = list(problems), {path: right for path, right in (pages or {}).items() if path.read_text() != right}
     for path, right in stale.items():

@@ -1,6 +1,8 @@
 #!/usr/bin/env python3
-"""Writes the table of steps in docs/testing.md from scripts/check, and has scripts/check run steps that
-pass, fail and skip."""
+"""Compares the steps of scripts/check with docs/testing.md, README.md and scripts/setup. With
+--write, rewrites the table of steps in docs/testing.md. Checks what scripts/check prints for steps
+that pass, fail or are skipped. Checks that scripts/kernel and scripts/bare-system are skipped if
+they cannot run."""
 
 import contextlib
 import os
@@ -38,7 +40,7 @@ def page_with_steps():
 
 
 def part(path, beginning, end):
-    """The text of the file between two lines, given as patterns."""
+    """The text of the file between two lines, which the patterns `beginning` and `end` match."""
     return re.search(rf"^{beginning}\n(.*?)^{end}$", (ROOT / path).read_text(), re.M | re.S)[1]
 
 
@@ -49,19 +51,20 @@ def known_to_setup():
 
 
 def setup_problems():
-    """Checks that scripts/setup knows every step that a script calls it with."""
+    """Checks that scripts/setup knows every step of scripts/check, and every step for which another
+    script calls it."""
     asked = {("scripts/check", step) for step in listed_steps()}
     for path in (ROOT / "scripts").iterdir():
-        asked |= {(path.name, word) for words in re.findall(r"^ *scripts/setup ([\w ]+)$",
-                                                            path.read_text(), re.M)
+        asked |= {(f"scripts/{path.name}", word)
+                  for words in re.findall(r"^ *scripts/setup ([\w ]+?)(?: \|\| .*)?$", path.read_text(), re.M)
                   for word in words.split()}
     return [f"{who} asks scripts/setup for {word}, which it does not know"
             for who, word in sorted(asked) if word not in known_to_setup()]
 
 
 def list_problems():
-    """Checks that every step has a function, in the same order, and that README.md shows the
-    everyday steps."""
+    """Checks that scripts/check has a function for every step, in the order of its table. Checks
+    that README.md shows the everyday steps, which are those of scripts/test."""
     functions = re.findall(r"^step_(\w+)\(\)", (ROOT / "scripts/check").read_text(), re.M)
     shown = re.findall(r"^([a-z]\w+) .*build/logs", part("README.md", r"\$ scripts/test", "```"), re.M)
     return [f"{what}: {found} in place of {expected}"
@@ -76,7 +79,7 @@ def check(directory, *steps):
 
 @contextlib.contextmanager
 def scripts(name):
-    """A directory with only a copy of this script."""
+    """Yields a new directory that contains only a copy of the project's script scripts/`name`."""
     with tempfile.TemporaryDirectory() as directory:
         (pathlib.Path(directory) / "scripts").mkdir()
         shutil.copy(ROOT / "scripts" / name, pathlib.Path(directory) / "scripts")
@@ -117,7 +120,7 @@ def run_problems():
                 yield f"scripts/check {steps} ends with {found}"
         write(directory / "scripts/setup", "exit 1")
         if (found := check(directory, "arrows"))[1] == 0:
-            yield f"scripts/check goes on without its packages: {found}"
+            yield f"scripts/check succeeds although scripts/setup failed: {found}"
 
 
 def skip_problems():

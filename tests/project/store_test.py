@@ -163,7 +163,7 @@ def main():
     with tempfile.TemporaryDirectory() as name:
         directory = pathlib.Path(name).resolve()
         expected = prepare(pathlib.Path(golden), directory)
-        return report(check(directory, simulator, expected))
+        return report(check(directory, simulator, expected), "the commands of docs/store.md")
 
 
 if __name__ == "__main__":

@@ -1,8 +1,9 @@
-"""Runs functions of the tool's sources, unchanged, on Python's values.
+"""Reads functions of the tool's C++ sources and runs them in Python.
 
-The statements of a function are translated into Python. For the arithmetic that is proved here, C++
-and Python look almost the same. A value may be a Word: a term of z3 that stands for every value of
-its type. A comparison of a Word splits the run: there is one run for each possible answer.
+load() translates the statements of a function into Python. For the arithmetic that is proved here,
+C++ and Python look almost the same. A value may be a Word: a term of z3 that stands for every value
+of its type. If a branch depends on a comparison of Words, the run splits: there is one run for each
+possible answer.
 
 The dialect. A function that is read here may have only these forms:
 
@@ -18,10 +19,10 @@ The dialect. A function that is read here may have only these forms:
                true, false; *name, &name in a call, name[i], name->name, calls; static_cast to one of
                the types above. A Word has + - * / << >> & | < and ==.
 
-Constants of the file that consist of numbers are known. All others must be passed to load().
-Comments and preprocessor lines are ignored. Any other form ends the proof with an Unread, which
-names the line. Then write that line in the dialect, or add its form here, to the list and to the
-translation.
+The translation knows the file's constants that are computed only from numbers. All other constants
+must be passed to load(). Comments with // and preprocessor lines are ignored. Any other form ends
+the proof with an Unread, which names the line. Then write that line in the dialect, or add its form
+here, to the list and to the translation.
 """
 import pathlib
 import re
@@ -33,8 +34,8 @@ ROOT = pathlib.Path(__file__).resolve().parents[2]
 
 
 class Word:
-    """An unsigned number, with the operators of C++. A proof must define its products and
-    quotients."""
+    """An unsigned number, with some operators of C++. A proof that multiplies or divides Words must
+    first set Word.product or Word.quotient."""
 
     product = quotient = None
 
@@ -89,7 +90,8 @@ class Word:
 
 
 class Answer(Word):
-    """The result of a comparison: the number 0 or 1. It splits the run if the run depends on it."""
+    """The result of a comparison: the number 0 or 1. If a branch of the function
+    depends on it, the run splits (see Runs)."""
 
     runs = None
 
@@ -123,7 +125,7 @@ class Runs:
 
     def decide(self, condition):
         if len(self.taken) == self.most:
-            raise AssertionError("the run does not end")
+            raise AssertionError("the run makes too many decisions, and perhaps does not end")
         if len(self.taken) < len(self.planned):
             yes = self.planned[len(self.taken)]
         else:
@@ -160,24 +162,24 @@ class Unread(Exception):
     def __init__(self, path, line, why):
         text = (ROOT / path).read_text().splitlines()[line - 1].strip()
         super().__init__(f"{path}:{line}: `{text}` is not in the dialect that tests/proofs/cpp_function.py "
-                         f"describes ({why}). Write the line in it, or add its form there.")
+                         f"describes ({why}). Write the line in the dialect or add its form there.")
 
 
 def code(path):
-    """The source file without its comments and preprocessor lines."""
+    """The source file without comments that begin with //, and without preprocessor lines."""
     return re.sub(r"//[^\n]*|^#[^\n]*", "", (ROOT / path).read_text(), flags=re.M)
 
 
 def load(path, name, **constants):
-    """The function `name` of the source file, as a Python function. Its globals are the constants
-    of the file that are numbers, and `constants`."""
+    """Returns the function `name` of the source file, as a Python function. This function knows the
+    names in `constants`, and the file's constants that are computed only from numbers."""
     text = code(path)
     scope = {"Pointer": Pointer, **constants}
     for constant, value in re.findall(r"constexpr \w+ (k\w+) = ([^;{}]+);\n", text):
         try:
             scope[constant] = eval(expression(value), scope)
         except (NameError, SyntaxError):
-            pass  # its values are not only numbers
+            pass  # not computed only from numbers
     found = re.search(r"^(?!\s)[^\n;{}]*?\b%s\(([^;{}]*)\) \{\n(.*?)^\}" % name, text, re.S | re.M)
     if not found:
         raise AssertionError(f"{path} has no function {name}: tell tests/proofs/prove.py its new name or file")
@@ -210,7 +212,8 @@ TYPE = rf"(?:const )?{TYPE_NAME}\b ?\*?"
 
 def statements(body, path, first):
     """Yields the lines of a function's body in Python, indented by one space per block. Each line
-    comes with its line number in the source file, in which the body begins at the line `first`."""
+    comes with its statement's line number in the source file. The body begins at the line `first`
+    of the source file."""
     body = re.sub(r"\bif \((.*)\) (\w[^{;]*;)", r"if (\1) {\2}", body)
     body = re.sub(r"\b(for \(.*?;.*?;.*?\)) ([\w*][^{;]*;)", r"\1 {\2}", body)
     steps = []
@@ -243,7 +246,7 @@ def statements(body, path, first):
 
 
 def simple(text):
-    """A statement without a block."""
+    """Translates a statement that has no block."""
     text = re.sub(r"^constexpr ", "const ", text)
     copied = re.match(r"memcpy\((&?)(\w+), (.*), sizeof\(\w+\)\)$", text)
     if copied:
