@@ -101,8 +101,8 @@ std::string NamesJson(const std::vector<std::string>& names) {
   return List(names, [](const std::string& name) { return EncodeText(name); });
 }
 
-// The entries, divided by the result of their comparison with the manifest. `looked_at` is the
-// number of matching or differing entries that the tool itself checked.
+// The entries, divided by the result of their comparison with the manifest. In `matching` and
+// `differing`, `looked_at` is the number of these entries that the tool itself checked.
 std::string EntriesJson(const Protection& all) {
   const auto share = [](const Share& counted, Members members) {
     members.insert(members.begin(), {{"entries", std::to_string(counted.entries)},
@@ -160,8 +160,8 @@ std::string RangeJson(const RangeJudgement& range) {
   return Object(members);
 }
 
-// Only the tool beside the simulator has a known version. One build makes the tool and the
-// simulator, so their versions are equal.
+// The version is known only for the tool in the simulator's own directory. One build makes this
+// tool and the simulator, so their versions are equal.
 std::string ToolJson(const ToolIdentity& tool) {
   Members members = {{"sha256", EncodeText(tool.sha256)}};
   if (tool.is_own) members.emplace_back("version", EncodeText(APKTOOLKIT_VERSION));

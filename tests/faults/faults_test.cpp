@@ -24,8 +24,8 @@ using namespace simulator;
 
 namespace {
 
-// Sends standard error to a file during the object's life, because the aborts in one test print
-// hundreds of messages.
+// Sends standard error to a file during the object's life. Otherwise the tool's aborts would fill
+// the output of the tests with hundreds of messages.
 class KeptStandardError {
  public:
   explicit KeptStandardError(const std::string& path) : saved_(dup(STDERR_FILENO)) {
@@ -58,7 +58,7 @@ class Installed {
 
   struct Outcome {
     ToolEnd ending;
-    bool failed;  // the call that must fail was made
+    bool failed;  // the run made the call of the fault, and this call failed
     // The kernel's signatures and libzu's registrations in order, one letter each. L: the library.
     // P: the package. J: a JAR. K: the package's key. N: this key under an empty name. ?: anything
     // else.
@@ -169,8 +169,8 @@ TEST(FailedCalls, RemoveOnlyDependentGrantsOfAGoodPackage) {
               {"read", {"PK"}},               // the library
               {"fopen", {"PK", "LK"}},        // the tool's integrity value, before each signing
               {"fcntl", {"PK", "PK", "LK"}},  // a copy of the library's descriptor; each signing
-              {"readlink", {"PK", "LPK"}},    // the libraries' directory; ReportMissingLocation
-              {"fstatvfs", {"LPK"}},          // the file system then counts as writable
+              {"readlink", {"PK", "LPK"}},    // to find the libraries; to report a missing path
+              {"fstatvfs", {"LPK"}},          // on failure, the file system counts as writable
               {"fgetxattr", {}}});            // the tool calls it only for JARs
 }
 
@@ -225,11 +225,12 @@ bool IsAbort(const ToolEnd& ending) {
   return ending.how == ToolEnd::How::kKilled && ending.value == SIGABRT;
 }
 
-// Makes each request for memory fail, one per run. A C++ container that gets no memory aborts, so a
-// run may end with an abort. The grants of an aborted run must be the start of `all`. They must not
-// be shorter than those of an earlier aborted run. A run with a failed request may also end
-// normally, if the tool and its libraries handle the missing memory. The grants of this run must be
-// one of `ways`. In the last run, no request fails, and the grants must be `all`.
+// Makes each request for memory fail, one per run. If a C++ container gets no memory, it aborts, or
+// the fault injector turns its crash into an abort. A run may therefore end with an abort. The
+// grants of an aborted run must be the start of `all`. They must not be shorter than those of an
+// earlier aborted run. A run with a failed request may also end normally, if the tool and its
+// libraries handle the missing memory. The grants of such a normal run must be one of `ways`. In
+// the last run, no request fails, and the grants must be `all`.
 void ExpectRunsWithoutMemory(Installed& file, const std::string& all,
                              const std::set<std::string>& ways) {
   constexpr int kMostCalls = 20000;

@@ -117,7 +117,7 @@ TEST(CertificateFacts, KeyThatCannotBeParsedHasOnlyItsAlgorithm) {
   EXPECT_EQ(facts->key.modulus_sha256, "");
 }
 
-TEST(CertificateFacts, CutCertificateHasNone) {
+TEST(CertificateFacts, CutCertificateHasNoFacts) {
   const Bytes der = Of("rsa-2048").Build();
   for (size_t size = 0; size < der.size(); size += 7) {
     EXPECT_EQ(ParseCertificate(View(Bytes(der.begin(), der.begin() + static_cast<int>(size)))),
@@ -187,8 +187,8 @@ TEST(CertificateFacts, BytesAfterTheCertificateAreIgnored) {
   EXPECT_EQ(ParseCertificate(View(der))->sha256, digest);
 }
 
-// The expected names are those that keytool prints after "Owner". keytool uses a class of the JDK
-// to write them.
+// ParseCertificate must write each name as keytool does. A class of the JDK writes the name that
+// keytool prints after "Owner".
 TEST(CertificateName, IsWhatTheJdkWrites) {
   const std::vector<Bytes> names = {
       Name({{"2.5.4.6", "AB"},
@@ -220,14 +220,14 @@ TEST(CertificateName, IsWhatTheJdkWrites) {
       "cd \"$0\"; for i in *; do LC_ALL=C.UTF-8 keytool -J-Dfile.encoding=UTF-8 "
       "-J-Dstdout.encoding=UTF-8 -printcert -file $i | sed -n 's/^Owner: //p'; "
       "done";
-  std::string expected;
+  std::string found;
   for (size_t i = 0; i < names.size(); ++i) {
     Certificate certificate;
     certificate.subject = names[i];
     directory.Write(std::to_string(i), certificate.Build());
     const auto facts = ParseCertificate(View(certificate.Build()));
     ASSERT_TRUE(facts.has_value()) << i;
-    expected += facts->subject + "\n";
+    found += facts->subject + "\n";
   }
-  EXPECT_EQ(RunProcess({"bash", "-c", command, directory.path()}).output, expected);
+  EXPECT_EQ(found, RunProcess({"bash", "-c", command, directory.path()}).output);
 }

@@ -81,7 +81,8 @@ TEST(Page, ShowsVerdictItemsWarningsAndSigner) {
         "<dt>key size (bits)</dt><dd>2048</dd>"}) {
     EXPECT_TRUE(Has(page, part)) << part << "\n" << page;
   }
-  EXPECT_EQ(Count(page, cause::kLibraryChanged.cure), 1U) << "said once for neighbours";
+  EXPECT_EQ(Count(page, cause::kLibraryChanged.cure), 1U)
+      << "neighbours with the same cure show it once";
 }
 
 TEST(Page, BeginsAsEveryPageDoes) {
@@ -100,8 +101,8 @@ TEST(Page, HasNoScriptAndNothingFromElsewhere) {
   EXPECT_FALSE(std::regex_search(page, std::regex("@import|https?:|url\\((?!#)")));
 }
 
-// A file name that contains markup changes only the page's texts, not its tags.
-TEST(Page, HasTheSameMarkupWhateverFilesAreCalled) {
+// Markup in the texts of a report, such as the file name, does not change the page's tags.
+TEST(Page, HasTheSameMarkupForAllTexts) {
   // Both names contain "/", so both pages have the element for the common directory of the files.
   const std::string plain = PageOf({HostileReport("x/x"), HostileReport("x/x")});
   const std::string hostile = PageOf({HostileReport(kHostileText), HostileReport(kHostileText)});
@@ -171,7 +172,7 @@ TEST(Page, ShowsEverythingUpToTheLimits) {
   EXPECT_EQ(Count(page, "<span class=\"name\">"), kMostPageLines);
   EXPECT_TRUE(Has(page, ">" + std::string(kMostPageText, 'b') + "<"));
   EXPECT_FALSE(Has(page, " more"));
-  EXPECT_LT(page.find(">a<"), page.find(">bbb")) << "in the order of the terminal";
+  EXPECT_LT(page.find(">a<"), page.find(">bbb")) << "in the order of the terminal's report";
 }
 
 // The euro sign has three bytes in UTF-8. The page shows all three bytes of a euro sign, or none.
@@ -358,7 +359,7 @@ TEST(Page, PutsTheToolAndTheInstallerSideBySide) {
 
 TEST(Page, SaysWhereTheInstallerWasNotAskedOrGaveUp) {
   Report report = Example(Verdict::kRefused);
-  EXPECT_FALSE(Has(PageOf(report), "\"judgements\"")) << "it is no package";
+  EXPECT_FALSE(Has(PageOf(report), "\"judgements\"")) << "the file is not a package";
   report.chain = {{"key", LinkState::kBroken, ""}};
   report.items = {Library("lib/arm/a.so", &cause::kLibraryChanged)};
   EXPECT_TRUE(Has(PageOf(report), "</span> were not asked</td>"));
@@ -393,7 +394,7 @@ TEST(Page, ToolSignsAPackageThatTheGateRefuses) {
   EXPECT_TRUE(Has(PageOf(report), "</span> signs it</td>"));
 }
 
-// The tool registers the key even if the kernel refuses to sign.
+// The tool can register the key of a good package although nothing was signed.
 TEST(Page, ToolThatOnlyRegistersTheKeySignsNothing) {
   Report report = Example(Verdict::kRefused);
   report.chain = {{"key", LinkState::kHolds, ""}};
