@@ -1,5 +1,6 @@
 #!/usr/bin/env python3
-"""Checks that journals of real runs follow docs/journal.schema.json.
+"""Checks that journals of real runs follow docs/journal.schema.json, and that docs/journal.md names
+every member and value of the schema.
 
 Arguments: the directory of a good package that asks for the registration of its key, and the
 command line that starts apktoolkit-sim.
@@ -48,6 +49,16 @@ def runs(package, directory):
     yield [odd_name]
 
 
+def words_of(schema, name=""):
+    """The members of objects, and the values of enumerations. The reasons are in docs/messages.md."""
+    if isinstance(schema, list):
+        schema = dict(enumerate(schema))
+    if not isinstance(schema, dict) or name == "reason":
+        return set()
+    words = set(schema.get("properties", ())) | {word for word in schema.get("enum", ()) if isinstance(word, str)}
+    return words.union(*(words_of(part, key) for key, part in schema.items()))
+
+
 def main():
     package = pathlib.Path(sys.argv[1]) / "base.apk"
     validator = jsonschema.Draft202012Validator(SCHEMA)
@@ -74,7 +85,9 @@ def main():
             poorer = {key: value for key, value in event.items() if key != member}
             if validator.is_valid(poorer):
                 problems.append(f"the schema accepts {poorer}, although {member} is missing")
-    return report(problems, "docs/journal.schema.json; for a new event or verdict, also runs() in tests/project/journal_test.py")
+    page = (ROOT / "docs/journal.md").read_text()
+    problems += [f"docs/journal.md does not name `{word}`" for word in words_of(SCHEMA) if f"`{word}`" not in page]
+    return report(problems, "docs/journal.md or docs/journal.schema.json; for a new event or verdict, also runs() in tests/project/journal_test.py")
 
 
 if __name__ == "__main__":
