@@ -43,11 +43,11 @@ ManifestSection ManifestSections::operator[](size_t index) const {
 }
 
 void ManifestSections::reset(const uint8_t* text, size_t size) {
-  // Reserves the table once, because a growing table needs its old and its new memory at the same
-  // time. Reserving takes only addresses: the system provides the memory page by page when the
-  // table is written. Most attributes take at least kShortAttribute bytes of text, so the table
-  // rarely grows later. kManyAttributes are enough for two attributes of each of the 65,535 entries
-  // that an archive without zip64 can have.
+  // Reserves the memory of attributes_ in advance, because a growing vector needs its old and its
+  // new memory at the same time. Reserved memory is only a range of addresses: the system provides
+  // each page when the page is first written. Most attributes take at least kShortAttribute bytes
+  // of text, so attributes_ rarely grows beyond the reserved memory. kManyAttributes is enough for
+  // two attributes of each of the 65,535 entries that an archive without zip64 can have.
   constexpr size_t kShortAttribute = 32;
   constexpr size_t kManyAttributes = 1 << 17;
   text_ = reinterpret_cast<const char*>(text);
@@ -59,9 +59,10 @@ void ManifestSections::reset(const uint8_t* text, size_t size) {
 
 // Sorts the open section if the new attribute starts at or after the offset patience_. The sort
 // drops repeated names, which could otherwise fill the table. Each sort compares all names of the
-// section. To save time, the next sort waits for as many bytes of text as these names have in
-// total, plus kTwoAttributes for each name, plus kLittleText. kTwoAttributes is the length of two
-// short attributes, such as "A: b", with their line ends.
+// section. To save time, add() then moves patience_ beyond the start of the new attribute. The
+// distance is the total length of the remaining names, plus kTwoAttributes for each of these names,
+// plus kLittleText. kTwoAttributes is the length of two short attributes, such as "A: b", with
+// their line ends.
 void ManifestSections::add(const ManifestAttribute& attribute) {
   constexpr size_t kTwoAttributes = 10;
   attributes_.push_back(attribute);

@@ -88,8 +88,8 @@ int fill_window(mpi_local* W, int w, montgomery* m) {
   return 0;
 }
 
-// Computes X = W[1]^abs(E), by a sliding window of w bits. Before the call, X must be 1. All these
-// values except E are in Montgomery form.
+// Computes X = W[1]^abs(E), by a sliding window of w bits. Before the call, X must be 1. X (before
+// and after the call) and the numbers in W are in Montgomery form.
 void raise(mpi* X, const mpi* E, const mpi_local* W, int w, montgomery* m) {
   int nbits = 0;
   int wbits = 0;

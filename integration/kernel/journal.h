@@ -1,8 +1,8 @@
 /* SPDX-License-Identifier: GPL-2.0-only OR Apache-2.0 */
 /*
- * Writes the journal of the module (docs/journal.md). journal_sign, journal_verify and
- * journal_integrity each write one line. The module's parameter `journal` names the file of the
- * journal. Without this parameter, nothing is written.
+ * Writes the journal of the kernel module (docs/journal.md). The module's parameter `journal` names
+ * the file of the journal. With this parameter, each call of journal_sign, journal_verify or
+ * journal_integrity appends one line. Without it, these functions write nothing.
  */
 #include <linux/types.h>
 

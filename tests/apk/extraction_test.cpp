@@ -85,7 +85,7 @@ TEST(Extraction, StoredEntryMustBeAsLongAsItsData) {
   EXPECT_TRUE(IsPlausibleLength(entry));
 }
 
-// A test declares the length kLongLength - 1, which is also above kZipTrustedLength.
+// Large enough that kLongLength - 1, which a test declares, is also above kZipTrustedLength.
 constexpr uint32_t kLongLength = kZipTrustedLength + 2;
 // An entry of kLongLength zeros. It is made once, because the compression takes time.
 const ZipItem& LongItem() {

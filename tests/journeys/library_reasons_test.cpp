@@ -38,8 +38,9 @@ TEST_F(Reason, LibraryInASubdirectoryOfItsAbiIsReported) {
             "installers do not extract it to lib/arm64/sub/libx.so, where the tool looks");
 }
 
-// A phone's installer extracts the libraries of only one ABI. Without --install=all, the simulator
-// does the same. Libraries of other ABIs do not count as refused, even with --strict.
+// A phone's installer extracts the libraries of only one ABI. With --install and --install=arm, the
+// simulator also extracts the libraries of only one ABI. The libraries of the other ABI do not
+// count as refused, even with --strict.
 TEST_F(Reason, LibrariesOfAnotherProcessorAreNotLaidOut) {
   Take("apksigner-sha256-2048");
   Do("rm -r lib");
@@ -57,8 +58,8 @@ TEST_F(Reason, LibrariesOfAnotherProcessorAreNotLaidOut) {
   EXPECT_EQ(Told(4, {"--install=all", "--strict"}).back(), "-> 0");
 }
 
-// Installers do not extract a library from a subdirectory of its ABI. With --strict, the library
-// then counts as refused.
+// Installers do not extract a library from a subdirectory of its ABI. With --strict, a library in
+// a subdirectory counts as refused.
 TEST_F(Reason, StrictRefusesALibraryThatNoInstallerExtracts) {
   MakePackage(WithLibraries({{"lib/arm64-v8a/libx.so", ToBytes("x")},
                              {"lib/arm64-v8a/sub/liby.so", ToBytes("y")}}))

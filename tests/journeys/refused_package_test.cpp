@@ -1,5 +1,5 @@
-// Runs the tool on packages that were changed after they were signed, or that lack a part. Tests
-// what the tool refuses, and for which reasons.
+// Runs the tool on packages with a changed, missing or wrongly signed part. Tests what the tool
+// refuses, and for which reasons.
 #include <gtest/gtest.h>
 #include <sys/stat.h>
 
@@ -33,8 +33,8 @@ class RefusedPackage : public testing::Test {
     return Simulate(apk_);
   }
 
-  // The tool refuses the package before it does anything else. The events `reasons` come first, and
-  // nothing is signed.
+  // The tool refuses the package before VeltSignJni, the first step. The events `reasons` come
+  // first, and nothing is signed.
   void ExpectRefusalAfter(std::initializer_list<std::string> reasons) const {
     const Simulation run = Run();
     EXPECT_EQ(run.timeline, Timeline({Timeline(reasons), NothingSigned(apk_), Exit(0)}));
@@ -159,7 +159,7 @@ TEST_F(TamperedPackage, AddedDexFileThatTheManifestDoesNotNameIsRefused) {
   ExpectDexFileRefusedAfter({Log(6, "Can't find file in META-INF/MANIFEST.MF: classes.dex\n")});
 }
 
-// Deliberate: the tool compares only one dex file with the manifest, classes.dex.
+// Deliberate: the tool compares only one dex file, classes.dex, with the manifest.
 TEST_F(TamperedPackage, SecondDexFileIsNotLookedAt) {
   package_ = MakePackage([] {
     PackageOptions options;

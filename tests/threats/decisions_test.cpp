@@ -29,8 +29,8 @@ Bytes WithForgedBlock(const Bytes& exponent) {
 
 // The tool reads the first four bytes of each exponent as 1 or -1. If an exponent is shorter, the
 // tool reads the missing bytes as 0. Bytes 5 to 8 of a longer exponent overwrite the length of the
-// modulus. These bytes agree with 00 01 00 00, which is 256 in host byte order, so that the length
-// does not change.
+// modulus: 256, which is stored as the bytes 00 01 00 00. In this test, bytes 5 to 8 equal the
+// bytes that they overwrite, so that the length does not change.
 TEST(Threat, ExponentReadAsOneOrMinusOneIsRefused) {
   for (const char* exponent :
        {"01", "01 00", "01 00 00", "01 00 00 00", "FF FF FF FF", "01 00 00 00 00 01",
@@ -64,8 +64,8 @@ class LibraryAfterItsCheck : public testing::Test {
     device_.Install("../system/program", ToBytes("\177ELF system"));
   }
 
-  // Runs the steps, and calls `exchange` just before the tool opens the library the second time.
-  // Returns the files that are signed: the package, and perhaps the library.
+  // Runs the tool's steps, and calls `exchange` just before the tool opens the library the second
+  // time. Returns the files that are signed: the package, and perhaps the library.
   Strings FilesSigned(const std::function<void()>& exchange) {
     device_.phone.before_open = [=](const char* path, int) {
       seen_ += std::string(path).find("/mine/libx.so") != std::string::npos;
