@@ -100,7 +100,7 @@ LogLine ReadLogLine(const std::string& text) {
   return line;
 }
 
-const LogLine* FindError(const std::vector<LogLine>& lines, LogMeaning meaning) {
+const LogLine* FindLine(const std::vector<LogLine>& lines, LogMeaning meaning) {
   const auto found = std::find_if(lines.begin(), lines.end(), [meaning](const LogLine& line) {
     return line.meaning == meaning;
   });

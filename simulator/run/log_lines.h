@@ -67,6 +67,6 @@ struct LogLine {
 LogLine ReadLogLine(const std::string& text);
 
 // The first line with this meaning; null if no line has it.
-const LogLine* FindError(const std::vector<LogLine>& lines, LogMeaning meaning);
+const LogLine* FindLine(const std::vector<LogLine>& lines, LogMeaning meaning);
 
 }  // namespace simulator

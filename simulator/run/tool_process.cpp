@@ -90,7 +90,8 @@ int Spawn(Words words, Words environment, pid_t* child) {
   return error;
 }
 
-// The words for the C interface, with a null pointer at the end.
+// Returns pointers to the words and then a null pointer, as posix_spawnp needs them. The words are
+// not copied.
 std::vector<char*> Pointers(Words* words) {
   std::vector<char*> pointers;
   for (std::string& word : *words) pointers.push_back(word.data());

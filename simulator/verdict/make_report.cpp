@@ -141,14 +141,14 @@ Item OwnItem(const RunRecord& run, const PackageFacts& facts, const JudgeOptions
 ItemKind KindOf(const RunRecord& run) {
   constexpr char kNoData[] = "0000";
   if (run.is_jar || (run.own && run.own->payload == kNoData)) return ItemKind::kJar;
-  const bool is_archive = FindError(run.opening_errors, LogMeaning::kNoArchive) == nullptr;
+  const bool is_archive = FindLine(run.opening_errors, LogMeaning::kNoArchive) == nullptr;
   return is_archive ? ItemKind::kPackage : ItemKind::kFile;
 }
 
 Reason WhyJarRefused(const RunRecord& run, const PackageFacts& facts) {
   Reason encrypted = WhyEncrypted(facts);
   if (encrypted.detail == kAndroidManifestName) return encrypted;
-  const LogLine* const line = FindError(run.opening_errors, LogMeaning::kNoAndroidManifest);
+  const LogLine* const line = FindLine(run.opening_errors, LogMeaning::kNoAndroidManifest);
   if (line != nullptr && line->text != ErrorCodeString(ApkTools::kZipEntryNotFound)) {
     return {&cause::kAndroidManifestDamaged, ""};
   }

@@ -50,7 +50,7 @@ Reason WhyRefused(const RunRecord& run, const PackageFacts& facts) {
     if (meaning == LogMeaning::kManifestMalformed) return {&cause::kManifestMalformed, ""};
     if (meaning == LogMeaning::kAndroidManifestMalformed) return {&cause::kAndroidManifestText, ""};
   }
-  if (FindError(errors, LogMeaning::kTextMalformed) != nullptr) {
+  if (FindLine(errors, LogMeaning::kTextMalformed) != nullptr) {
     return {&cause::kSignatureFileMalformed, FirstSignatureFile(jar)};
   }
   if (!errors.empty()) return {&cause::kToolError, errors[0].whole};
@@ -160,7 +160,7 @@ Reason WhySignatureRefused(const Lines& errors, int64_t code, const JarSignature
   if (jar.block.has_pss) return {&cause::kSignatureDigest, "RSASSA-PSS"};
   if (jar.block.is_whole && !jar.block.has_known_digest)
     return {&cause::kSignatureDigest, jar.block.digest};
-  if (FindError(errors, LogMeaning::kOtherDigest) != nullptr) {
+  if (FindLine(errors, LogMeaning::kOtherDigest) != nullptr) {
     return {&cause::kSignatureFileChanged, FirstSignatureFile(jar)};
   }
   return {&cause::kSignatureWrong, jar.block_name};
@@ -168,7 +168,7 @@ Reason WhySignatureRefused(const Lines& errors, int64_t code, const JarSignature
 
 Reason WhyManifestRefused(const Lines& errors, const JarSignatureFacts& jar) {
   const bool has_none =
-      FindError(errors, LogMeaning::kDigestUnknown) != nullptr || !jar.has_manifest_digest;
+      FindLine(errors, LogMeaning::kDigestUnknown) != nullptr || !jar.has_manifest_digest;
   return {has_none ? &cause::kManifestDigest : &cause::kManifestChanged, ""};
 }
 

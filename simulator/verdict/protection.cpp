@@ -1,4 +1,5 @@
-// The parts of a package that its signature protects.
+// Finds the entries of a package that its signature protects. Also makes the chain from the key to
+// the entries.
 #include <algorithm>
 #include <map>
 #include <string>

@@ -112,6 +112,6 @@ TEST(ToolLogLine, WholeTextLosesItsLastLineEnd) {
 TEST(FindLogLine, ReturnsTheFirstLineWithTheMeaning) {
   const std::vector<LogLine> lines = {ReadLogLine("RSA could not set key: 5\n"),
                                       ReadLogLine("RSA could not set key: 9\n")};
-  EXPECT_EQ(FindError(lines, LogMeaning::kKeyRefused), lines.data());
-  EXPECT_EQ(FindError(lines, LogMeaning::kNoBlock), nullptr);
+  EXPECT_EQ(FindLine(lines, LogMeaning::kKeyRefused), lines.data());
+  EXPECT_EQ(FindLine(lines, LogMeaning::kNoBlock), nullptr);
 }
