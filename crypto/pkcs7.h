@@ -8,7 +8,7 @@
 
 #include <cstdint>
 
-// Lengths are in bytes. The modulus, the exponent and the signatures are big-endian numbers.
+// Lengths are in bytes. The modulus and the signatures are big-endian numbers.
 struct pkcs7 {
   const uint8_t* modulus;         // of the certificate's RSA key; one leading zero byte is left out
   const uint8_t* cert_signature;  // the certificate's signatureValue
@@ -17,7 +17,7 @@ struct pkcs7 {
   uint32_t tbs_data_length;
   uint32_t cert_signature_length;
   uint32_t signed_digest_length;
-  uint8_t exponent[4];  // the public exponent's first bytes in order, then zeros
+  uint8_t exponent[4];  // first four bytes of the big-endian exponent; zeros after a shorter one
   uint32_t modulus_length;
 };
 
@@ -26,9 +26,10 @@ struct pkcs7 {
 // success and 1 for failure. After a failure, `record` keeps the fields that were stored before the
 // failure.
 //
-// The lengths of outer elements are trusted: they are not compared with the end of the enclosing
-// element. If the exponent has more than four bytes, its fifth to eighth byte overwrite
-// `modulus_length`. The `modulus_length` bytes at `modulus` and the `signed_digest_length` bytes at
-// `signed_digest` may end beyond the block, so the caller must check them. The bytes at
+// The outer elements are those from the start of the block to the [0] of the certificates. Their
+// lengths are trusted: they are not compared with the end of the enclosing element. If the exponent
+// has more than four bytes, its fifth to eighth byte overwrite `modulus_length`. The
+// `modulus_length` bytes at `modulus` and the `signed_digest_length` bytes at `signed_digest` may
+// end beyond the block. The caller must therefore check where these bytes end. The bytes at
 // `cert_signature` and `tbs_data` are inside the block.
 int processCert(const uint8_t* block, uint32_t length, pkcs7* record);

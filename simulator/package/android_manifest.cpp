@@ -69,7 +69,7 @@ void ReadAsInstaller(ResXMLParser* parser, AndroidManifest* manifest) {
   }
 }
 
-// Accepts the attribute in any namespace, as installers do.
+// Accepts the attribute extractNativeLibs in any namespace, as installers do.
 std::optional<bool> ExtractsLibraries(const ResXMLParser& application) {
   std::optional<bool> extracts;
   for (size_t i = 0; i < application.getAttributeCount(); ++i) {

@@ -148,8 +148,8 @@ std::string FindEntryTwice(int fd) {
   return {};
 }
 
-// Archive::Walk does not return the names of damaged entries. The second loop adds the damaged
-// libraries from `facts->entries`.
+// Archive::Walk does not return the names of damaged entries. The second loop adds the
+// libraries with damaged entries from `facts->entries`.
 void FindLibraries(const Archive& archive, const std::string& path, PackageFacts* facts) {
   const ArchiveWalk walk = archive.Walk(kLibraryNames);
   for (size_t i = 0; i < walk.names.size(); ++i) {

@@ -1,5 +1,5 @@
-// The stand-in for libzu, the process-authentication library. The source of libzu is closed. The
-// tool is linked against the stand-in in the same way as against libzu.
+// The stand-in for libzu, the closed process-authentication library. A build with the simulator
+// links the tool against the stand-in in place of libzu.
 #include "sign/libzu.h"
 
 #include <string_view>

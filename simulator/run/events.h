@@ -18,7 +18,7 @@ std::string TextOf(const nlohmann::json& event, const char* key);
 // The integer of `event` under `key`; 0 if the event has no such integer.
 int64_t NumberOf(const nlohmann::json& event, const char* key);
 
-// True if the answer of the kernel or libzu in `event` is 0.
+// True if the kernel's answer in `event` is 0. For libzu's answer, use IsZuSuccess (sign/libzu.h).
 bool IsSuccess(const nlohmann::json& event);
 
 // True if `event` describes what the tool did. False for the events "journal", "start", "attached"

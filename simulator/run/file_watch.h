@@ -1,6 +1,6 @@
 // Detects that a file is changed while it is examined. The tool, the simulator and the installer's
-// verifier read a file one after the other. If the file changes meanwhile, their answers can be
-// about different bytes.
+// verifier read the file separately. If the file changes meanwhile, their answers can be about
+// different bytes.
 #pragma once
 
 #include <sys/stat.h>

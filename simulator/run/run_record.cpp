@@ -34,7 +34,7 @@ class Reader {
   RunRecord record_;
   Step step_ = Step::kOpening;
   std::optional<Attempt> attempt_;  // begun, and not yet closed
-  std::vector<LogLine> pending_;    // errors of a file that a later line names
+  std::vector<LogLine> pending_;    // errors about a file; a later log line names this file
 };
 
 }  // namespace

@@ -1,5 +1,7 @@
 // Prints a report for a person: the verdict, the items with their cures, the warnings, the signer
-// and the timeline. Detail::kVerdict prints only the verdict's line.
+// and the timeline. Detail::kVerdict prints only the verdict's line. Detail::kAll adds to the
+// report the names of differing, missing and unlisted entries, the signers of newer schemes, and
+// the chain from the key to the entries.
 #pragma once
 
 #include <ostream>

@@ -18,9 +18,9 @@ struct TimelineLine {
   bool is_failure = false;
 };
 
-// The events of one run. In the lines of the events "sign" and "verify", a path below the directory
-// of the file at `path` is shown without that directory. Equal events that follow each other are
-// one line.
+// The events of one run. Leaves out the events for which IsOfTheRun is false. In the lines of the
+// events "sign" and "verify", a path below the directory of the file at `path` is shown without
+// that directory. Equal events that follow each other are one line.
 std::vector<TimelineLine> MakeTimeline(const Events& events, const std::string& path);
 
 void PrintTimeline(const std::vector<TimelineLine>& lines, const Look& look, std::ostream& out);

@@ -27,8 +27,8 @@ Reason WhyNotThere(const LibraryFacts& library, const RunRecord& run, const Pack
 void AddLibraryItems(const RunRecord& run, const PackageFacts& facts, const JudgeOptions& options,
                      std::vector<Item>* items) {
   const bool is_walked = run.own || !run.libraries.empty();
-  // Only a package has libraries. If the tool tried to sign libraries of another file, each attempt
-  // still gets an item.
+  // Only a package has libraries. If the tool tried to sign libraries for a file that is not a
+  // package, each attempt still gets an item.
   const bool is_package = items->front().kind == ItemKind::kPackage;
   for (const Library& library :
        MatchAttempts(run, is_package ? facts.libraries : std::vector<LibraryFacts>())) {

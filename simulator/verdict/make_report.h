@@ -1,5 +1,5 @@
 // Makes a report from the record of a run, the facts of the file and the judgement of the phones'
-// installer. A pure function: it reads and writes no files.
+// installer. MakeReport is a pure function: it reads and writes no files.
 #pragma once
 
 #include <cstdint>
@@ -23,8 +23,8 @@ struct JudgeOptions {
 Report MakeReport(const RunRecord& run, const PackageFacts& facts, const JudgeOptions& options,
                   const Judgement& installer = {});
 
-// Makes an item that is not kDone. The severity of its cause and `options.is_strict` set its state.
-// The cause must not be null.
+// Makes an item whose state is not kDone. The severity of `reason.cause`, together with
+// `options.is_strict`, decides the state. `reason.cause` must not be null.
 Item NotDone(ItemKind kind, const std::string& name, const Reason& reason,
              const JudgeOptions& options);
 

@@ -38,8 +38,8 @@ TEST(VerifyCertificate, FailedAllocationInTheVerificationIsReported) {
     const bool certificate = log.records()[0] == Error("RSA could not verify certificate: 11\n");
     const bool data = log.records()[0] == Error("RSA could not verify data: 11\n");
     // Code 7: the allocation for the exponent failed. rsa_set_key does not report this, and the
-    // exponent is then 0. Nothing verifies, because any number to the power of 0 is 1, and 1 has no
-    // valid padding.
+    // exponent is then 0. No signature verifies with this exponent: any number to the power of 0
+    // is 1, and 1 has no valid padding.
     EXPECT_TRUE(certificate || data ||
                 log.records()[0] == Error("RSA could not verify certificate: 7\n"))
         << call << ": " << log.records()[0];

@@ -14,7 +14,8 @@ NAMED = re.compile(r"`((?:\w+/)?[A-Z]\w+)\.(\*|[A-Z]\w+)`")
 DEFINED = re.compile(r"^TEST(?:_F|_P)?\(\s*(\w+),\s*(\w+)\)", re.M)
 INSTANTIATED = re.compile(r"INSTANTIATE_TEST_SUITE_P\(\s*(\w+),\s*(\w+),")
 PROJECT = re.compile(r"apktoolkit_add_project_test\((\w+) ")
-# A test's name begins with its subject, or with a verb whose subject is the suite.
+# A test's name must begin with its subject, or with a verb whose subject is the suite. NO_SUBJECT
+# lists words with which a name must not begin.
 NO_SUBJECT = re.compile(r"(A|An|The|What|Whatever|Of|On|With|Without|By|In|For|That|When|Nothing|No|There|It)[A-Z0-9]")
 LINK = re.compile(r"\]\(([^)#:]+)(?:#[^)]*)?\)")
 

@@ -30,7 +30,7 @@ TIMEOUT = ('<testcase name="A.Slow" status="fail"><failure message="Timeout"/><s
 NOT_BUILT = ('<testcase name="A.Absent" status="notrun">'
              '<skipped message="Unable to find executable"/></testcase>')
 
-CASES = [  # the output of ctest, the expected lines, the exit status
+CASES = [  # the tests in the file, the expected lines, the expected exit status
     ([PASSED, PASSED], ["2 passed, 0 failed, 0 skipped"], 0),
     ([PASSED, SKIPPED], ["skipped A.Skipped: no such kernel", "1 passed, 0 failed, 1 skipped"], 0),
     ([PASSED, DISABLED], ["skipped A.Disabled: disabled", "1 passed, 0 failed, 1 skipped"], 0),

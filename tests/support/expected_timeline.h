@@ -1,7 +1,7 @@
 // Tests describe the events of one run of the tool on a phone as a timeline: a text with one line
-// for each event, in order. Timelines are joined with `+`, and a difference is shown line by line.
-// Each function from Log to Exit returns the line of one event. The line has every member that the
-// event has in the journal (docs/journal.md).
+// for each event, in order. Timelines are joined with `+`. GoogleTest shows line by line how two
+// timelines differ. Each function from Log to Exit returns the line of one event. The line has
+// every member that the event has in the journal (docs/journal.md).
 #pragma once
 
 #include <initializer_list>
@@ -34,7 +34,7 @@ std::string Timeline(std::initializer_list<std::string> parts);
 // code.
 Bytes PackagePayload(const std::string& key = "rsa-2048");
 
-// The parts that many tests share.
+// Parts of timelines that many tests share.
 
 // The events of VeltSignJni, the step that signs the libraries: its first log record, the events of
 // each library, and its last log record.

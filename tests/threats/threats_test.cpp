@@ -120,9 +120,10 @@ TEST(Threat, DotsInAnEntryNameSignNoFileOutsideWithOtherBytes) {
   EXPECT_EQ(device.FilesSignedFor("rsa-2048"), Strings({"app/base.apk"}));
 }
 
-// `lead` makes a link to a program where the library's file should be. Expects that the program is
-// signed through this link. The name of the program does not end in ".so". The attacker knows the
-// program's bytes, and the manifest lists their digest.
+// Calls `lead`, which makes the link `name` to the file `program`. The tool looks for the library's
+// file at `name`. Expects that the program is signed through this link. The name of the program
+// does not end in ".so". The attacker knows the program's bytes, and the manifest lists their
+// digest.
 void ExpectProgramSigned(const std::function<int(const char* program, const char* name)>& lead) {
   Device device(MakePackage(WithLibrariesNamed({"lib/arm64-v8a/../../../mine/libx.so"})));
   device.Install("lib/arm64/x", {}).Install("../mine/x", {}).Install("../system/program", kLibrary);
@@ -185,14 +186,15 @@ TEST(Threat, PackageAndKeyAreAcceptedEvenIfEveryLibraryIsRefused) {
             Strings({"com.example.app " + Hex(ModulusOf("rsa-2048"))}));
 }
 
-// No library was extracted, and the tool does not read the library's bytes in the package.
+// The package's library was not extracted beside the package. The tool does not read the library's
+// bytes inside the package.
 TEST(Threat, LibrariesThatStayInThePackageAreNotCompared) {
   Package package = MakePackage();
   package.Item("lib/arm64-v8a/libfoo.so").data = ToBytes("another's");
   EXPECT_EQ(Device(package).FilesSignedFor("rsa-2048"), Strings({"app/base.apk"}));
 }
 
-// The libraries in the order of the iteration.
+// The names of the package's library entries, in the order in which the tool reaches them.
 Strings LibrariesWalked(const Package& package) {
   const MemoryFile file(package.Build());
   ApkTools::Apk apk(file.fd());
@@ -309,8 +311,8 @@ TEST(Threat, JarWrittenToInPlaceAfterItWasTrustedIsSigned) {
   EXPECT_EQ(BytesSigned(device)[jar][0], 'p');
 }
 
-// The zip library maps the archive's central directory, so a read of the lost part raises SIGBUS.
-// Files that were signed before the signal stay signed.
+// The zip library maps the archive's central directory. After the truncation of the archive, a read
+// of this directory raises SIGBUS. Files that were signed before the signal stay signed.
 TEST(Threat, FileThatShrinksMeanwhileEndsTheProcess) {
   PackageOptions options = WithLibrariesNamed({"lib/arm64-v8a/libfoo.so"});
   for (int i = 0; i < 1000; ++i) options.entries.push_back({"assets/" + std::to_string(i), {}});

@@ -26,7 +26,7 @@ extern "C" ssize_t __real_read(int fd, void* buffer, size_t size);
 
 class FileFixture : public testing::Test {
  protected:
-  void SetUp() override { alarm(60); }  // seconds; ends a test that waits for a FIFO
+  void SetUp() override { alarm(60); }  // seconds; kills the test program if a test hangs
   void TearDown() override {
     kernel = Kernel();
     alarm(0);

@@ -96,7 +96,8 @@ TEST(MakeReport, IntegrityValuesAreReadAsTheToolReadsThem) {
 // The report has the payload that the kernel accepted for the package. If the kernel accepted no
 // payload for the package, the report has the payload of the first library that the kernel signed.
 // The report's key is the key whose digest this payload contains. If the kernel signed nothing, the
-// report has no payload. Its key is then the key that the tool's own code reads.
+// report has no payload. The report's key is then the key that the tool's own code reads from the
+// package.
 TEST(MakeReport, KeyIsTheOneThatTheKernelGot) {
   const std::string own(64, 'a'), other(64, 'b');
   PackageFacts facts = WithLibraries({"lib/arm64-v8a/libfoo.so"});
