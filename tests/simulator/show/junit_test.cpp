@@ -108,7 +108,9 @@ TEST(Junit, OnlyWhatEndsWithStatusZeroPasses) {
       EXPECT_EQ(
           xml.find("<failure") == std::string::npos && xml.find("<error") == std::string::npos,
           is_good);
-      if (!is_good) EXPECT_NE(xml.find(element), std::string::npos) << xml;
+      if (!is_good) {
+        EXPECT_NE(xml.find(element), std::string::npos) << xml;
+      }
     }
   }
 }
