@@ -96,7 +96,8 @@ class Parser {
 
   // Deliberate: a line break does not end a name. If the line of the name has no colon, the name
   // continues on the next line. A name with a line break equals no name that the tool looks for. If
-  // a name with a line break ends like the name of a digest, the digest counts as unsupported.
+  // a name with a line break ends in "-Digest" or "-Digest-Manifest", it names an unsupported
+  // digest.
   bool readName() {
     storePair();
     size_t end = cursor_;
@@ -118,8 +119,8 @@ class Parser {
   // byte after the colon. After CR LF or LF CR, that byte is the second byte of the line break.
   // After a lone CR or LF, that byte is the first byte of the next line. The parser then treats
   // this first byte as the line break. A name on the next line loses its first byte. An empty line,
-  // or a continuation line with one space, is not recognised. Signing tools write CR LF. For other
-  // files, the result must not change.
+  // or a continuation line with one space, is not recognised. Signing tools write CR LF. For texts
+  // with other line breaks, the result must not change.
   bool passColon() {
     const char next = byteAt(cursor_ + 1);
     if (next != ' ' && !IsLineBreak(next)) {
@@ -132,8 +133,8 @@ class Parser {
     return true;
   }
 
-  // Moves the continuation line to the end of the value. This can overwrite the bytes between the
-  // value and the line, which are never read again.
+  // Appends the continuation line to the value. If the value is not empty, the line moves to the
+  // end of the value in the text. The overwritten bytes are never read again.
   void continueValue() {
     const ManifestPiece line = readLine();
     ManifestPiece& value = pending_.value;

@@ -1,6 +1,7 @@
 // bench_floor FILE: does the tool's job without the verification. The cost of this program is the
-// floor, a lower bound for the tool's cost. The program extracts the same entries as the tool and
-// reads the same libraries. It digests the same bytes and writes the same log.
+// floor, a lower bound for the tool's cost. The program extracts the same entries as the tool,
+// reads the same libraries, and writes the same log. It digests the same bytes as the tool, except
+// those of the certificate.
 #include <openssl/md5.h>
 #include <openssl/sha.h>
 

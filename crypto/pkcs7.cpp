@@ -193,7 +193,8 @@ bool ReadDigestAlgorithm(const Block& block, size_t offset, size_t end, asn1_hdr
          asn1_get_oid(algorithm->payload, algorithm->length, &oid, &next) == 0;
 }
 
-// Deliberate: the lines keep their spelling. Programs that read standard output match on them.
+// Deliberate: misspelled words such as "PARCER" must stay. Programs that read standard output match
+// on these lines.
 bool Fail(const char* format, ...) {
   printf("CERT_PARCER [ERROR]: ");
   va_list arguments;

@@ -1,5 +1,6 @@
 // crypto/rsa.h: any key and signature. libcrypto computes the encoded message from the signature,
-// and the target derives the expected result from this message.
+// and the target derives the expected result from this message. The target needs no message for a
+// bad length, an even modulus, or a signature that is not less than the modulus.
 #include "crypto/rsa.h"
 
 #include <algorithm>

@@ -18,8 +18,8 @@ namespace {
 
 using Context = std::unique_ptr<BN_CTX, void (*)(BN_CTX*)>;
 
-// The private exponent of the fuzz key for the magnitude of `exponent`, read as signed. Null if the
-// magnitude has no inverse.
+// Reads `exponent` as a signed number. Returns the fuzz key's private exponent for the number's
+// absolute value, or null if this value has no inverse.
 Bignum PrivateExponent(uint32_t exponent) {
   const RSA* const key = TestRsaKey(kFuzzKey);
   const Context context(BN_CTX_new(), BN_CTX_free);

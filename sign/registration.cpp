@@ -54,7 +54,7 @@ void RegisterPackage(ApkTools::Apk& apk, int fd) {
   ReportResult(ZuNewCertificate(fd, apk.GetPackageName().c_str(), key.data(), key.size()));
 }
 
-// Returns false if the attribute is missing, empty or unreadable.
+// Returns false if the extended attribute "user.zu" is missing, empty or unreadable.
 bool AsksForRegistration(int jar_fd) { return fgetxattr(jar_fd, "user.zu", nullptr, 0) >= 1; }
 
 // Returns 128 bytes: four SHA-256 digests. The first is the digest of the path. Each later digest

@@ -1,6 +1,7 @@
-# Builds for 64-bit Arm and API level 27, with any clang, with lld, and with your own sysroot. The
+# Builds for 64-bit Arm and API level 27, with clang 9 or later, lld, and your own sysroot. The
 # sysroot (-DCMAKE_SYSROOT=DIR) must have the target's C and C++ headers and libraries.
-# -DPLATFORM_INCLUDE_DIR and -DPLATFORM_LIBRARY_DIR name the platform libraries (docs/porting.md).
+# -DPLATFORM_INCLUDE_DIR names the header directories of the platform libraries.
+# -DPLATFORM_LIBRARY_DIR names the directory of these libraries (docs/porting.md).
 #
 # CMAKE_SYSTEM_NAME is Linux, because CMake requires an NDK if the name is Android.
 set(CMAKE_SYSTEM_NAME Linux)

@@ -16,8 +16,9 @@ Reason WhyRefused(const RunRecord& run, const PackageFacts& facts);
 // null cause if no such reason is known.
 Reason WhyNotLookedAt(const RunRecord& run, const PackageFacts& facts);
 
-// Why an archive without AndroidManifest.xml is probably not meant to be a JAR: it is an app bundle
-// or a set of packages, or has parts of a package. A null cause for every other archive.
+// The tool takes an archive without AndroidManifest.xml for a JAR. Returns why the archive is
+// probably something else: it is an app bundle or a set of packages, or has parts of a package. A
+// null cause for every other archive.
 Reason WhyTakenForAJar(const PackageFacts& facts);
 
 // Why the tool refused a file, if one of these entries is encrypted: AndroidManifest.xml,
@@ -28,7 +29,7 @@ Reason WhyEncrypted(const PackageFacts& facts);
 // the request to the kernel. A null cause for every other outcome.
 Reason WhyKernelDidNotSign(const Attempt& attempt);
 
-// Adds an item for each native library of the package, with its result. The first item in `items`
+// Adds an item with the result for each native library of the package. The first item in `items`
 // must be the item for the file itself.
 void AddLibraryItems(const RunRecord& run, const PackageFacts& facts, const JudgeOptions& options,
                      std::vector<Item>* items);
@@ -53,8 +54,8 @@ std::vector<Reason> FindWarnings(const RunRecord& run, const PackageFacts& facts
 Protection FindProtection(const PackageFacts& facts, const std::vector<Item>& items);
 
 // Makes the chain from the key to the entries. Only the items of the package and its libraries can
-// break a link. The first of these items whose cause has a link (Cause::link) breaks the chain at
-// this link. All members of the report except the chain must be filled.
+// break a link of the chain. The first of these items whose Cause::link is not kNone breaks the
+// link that Cause::link names. All members of the report except the chain must be filled.
 std::vector<Link> MakeChain(const PackageFacts& facts, const Report& report);
 
 }  // namespace simulator

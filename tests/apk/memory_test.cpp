@@ -104,9 +104,9 @@ TEST(ApkMemory, RepeatedNamesTakeLittleBesidesTheText) {
   EXPECT_LT(growth, 60 * kMegabyte + kKept);
 }
 
-// A million sections of one attribute each. Each section takes 20 bytes in ManifestSections, and 20
-// more bytes while ManifestSections grows. Repeated names after these sections take almost no
-// memory in ManifestSections, but they make the text 20 MB longer.
+// A million sections of one attribute each. Each section takes 20 bytes in ManifestSections.
+// Repeated names after these sections take almost no memory in ManifestSections, but they make the
+// text 20 MB longer.
 TEST(ApkMemory, RepeatedNamesAfterManySectionsTakeLittleBesidesTheText) {
   const std::string sections = Repeat("A: 1\n\n", 1000000);
   const long growth = GrowthWithSignatureFile(sections);

@@ -19,10 +19,10 @@ using ApkTools::Apk;
 
 namespace {
 
-// The names of the entries in the packages. The content of each entry is its name.
+// The names of the entries that WithEntries adds. The content of each added entry is its name.
 constexpr const char* kNames[] = {"a", "b", "c", "lib/long/name/of/an/entry.so", "classes.dex"};
 
-// All facts of an object about its package.
+// The facts that an Apk returns about its file, and the log.
 struct Facts {
   bool is_good_zip, is_apk, is_good_apk, asks_for_storage;
   std::string path, package_name, verified;

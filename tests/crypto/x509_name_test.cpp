@@ -69,7 +69,7 @@ TEST(X509Name, KnownAttributesAreKeptInOrderOfAppearance) {
 }
 
 TEST(X509Name, OtherAttributesAreSkipped) {
-  // Object identifiers next to the known ones, and shorter and longer ones.
+  // Each skipped object identifier differs by one arc from an identifier whose value is kept.
   const ParsedCertificate parsed(WithSubject(Name({{"2.5.4.2", "x"},
                                                    {"2.5.4.4", "x"},
                                                    {"2.5.4.5", "x"},
@@ -242,8 +242,9 @@ TEST(X509Time, BothTimesAreRead) {
 }
 
 TEST(X509Time, OtherLengthsAreMinus13) {
-  // Both lists: without seconds, with a fraction of a second, with an offset, empty, and with the
-  // length of the other list's type. The last UTCTime has one digit too many.
+  // Each of the two lists has a time without seconds, a time with a fraction of a second, a time
+  // with an offset, an empty text, and a time of the other type's length. The last UTCTime has one
+  // digit too many.
   for (const char* text : {"2001020304Z", "200102030405.5Z", "200102030405+0100", "",
                            "20200102030405Z", "2001020304050Z"}) {
     NotBefore(der::kUtcTime, text, -13);

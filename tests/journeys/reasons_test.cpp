@@ -107,7 +107,8 @@ TEST_F(Reason, CureByAnotherKeyStatesItsDisadvantage) {
 }
 
 // By default, keytool signs the certificate of an RSA key of 3584 bits with SHA-384. The package
-// keytool-sha256 is signed with the same key, after make_golden_packages applied the cure.
+// keytool-sha384 has such a certificate. The package keytool-sha256 has the same key, with the
+// certificate that the command in the cure makes.
 TEST_F(Reason, CertificateSignedWithSha384IsReported) {
   Take("keytool-sha384");
   const Lines told = Told(5);

@@ -9,7 +9,7 @@ import tempfile
 
 from sources import ROOT, report
 
-# Functions of later API levels: the declaration, the name that scripts/android prints, and a call.
+# Functions that API level 27 lacks: declaration, name as scripts/android prints it, and a call.
 LATER = {
     "int memfd_create(const char*, unsigned);": ("memfd_create", 'memfd_create("", 0)'),
     "long getrandom(void*, unsigned long, unsigned);": ("getrandom", "getrandom(0, 0, 0)"),

@@ -5,7 +5,7 @@ docs/journal.schema.json. With --write, writes these parts from the sources inst
 
 The explanation of each message is written by hand. The test fails if docs/messages.md has no entry
 for a message, or an entry for a message that the tool does not have. It also fails if the simulator
-looks for a text that the tool does not log.
+or library/verification.cpp looks for a text that the tool does not log.
 """
 
 import re
@@ -66,8 +66,8 @@ GROUPS = {"kNotLookedAt": "The tool did not look at the file",
           "kInstaller": "The installer of the phones",
           "kGate": "Demands of --signer and --werror, and of one signer for each package", "kWarning": "Warnings"}
 
-# A cause of these groups need not name a link of the chain (ChainLink). reasons_problems() has the
-# other exceptions.
+# A cause of these groups need not name a broken link of the chain from the key to the entries
+# (ChainLink). reasons_problems() has the other exceptions.
 UNBROKEN = {"kKernel", "kKey", "kInstaller", "kGate", "kWarning"}
 
 PAGE = ROOT / "docs/messages.md"
@@ -138,7 +138,7 @@ def log_problems(messages):
         problems.append(f"{LOG_LINES}: a row cannot be parsed")
     for text, captured in rows:
         if captured != "kNothing" and int(captured) >= len(re.findall("%", text)):
-            problems.append(f"there is nothing to capture in {joined(text)}")
+            problems.append(f"{LOG_LINES}: no conversion has the index {captured} in {joined(text)}")
     return problems
 
 

@@ -1,7 +1,7 @@
 #!/usr/bin/env python3
 """Runs the commands of docs/store.md over a few hundred packages on this machine. Kills all jobs
 in the middle, and continues the work. The journals must then have the verdict on each package
-exactly once. A journal that was cut off must not get the name of its list.
+exactly once. A journal that was cut off must not get the name of its list of packages.
 
 Arguments: the directory of the golden packages, and the command line that starts apktoolkit-sim.
 """
@@ -129,7 +129,7 @@ def cut_journal_problems(shell):
     process = shell.start("./check-batch 000000")
     _, errors = process.communicate()
     if process.returncode == 0 or "000000" in shell.journals():
-        return ["if its journal was cut off, a job must fail and must not rename the journal, "
+        return ["a job whose journal was cut off must fail and must not rename the journal, "
                 f"but the job ends with {process.returncode}: {errors}"]
     return []
 
@@ -146,7 +146,8 @@ def check(directory, simulator, expected):
         problems += found
     again = [name for name, when in first.items()
              if (directory / "journals" / name).stat().st_mtime_ns != when]
-    # Two jobs run at once. Both can end just before the kill, so that joblog lacks their lines.
+    # Two jobs run at once. If both end just before the kill, joblog lacks their lines, and
+    # `parallel` runs both lists again.
     if len(again) > 2:
         problems.append(f"these lists were done, and were run again: {again}")
     counts = [output for command, output in printed.items() if "group_by" in command]

@@ -1,5 +1,6 @@
 // Tests which files the tool asks the kernel to sign, their payloads, and the log. PackageOnPhone
-// writes a package to disk, and its libraries beside it. A Phone takes the place of the kernel.
+// writes a package to disk, and its function Install writes a library beside the package. A Phone
+// replaces the kernel's integrity feature.
 #include "sign/signing.h"
 
 #include <fcntl.h>
@@ -143,7 +144,7 @@ TEST(VeltSignJni, LibraryIsSignedByItsOwnDescriptorWithThePackagesPayload) {
   PackageOnPhone file(MakePackage(WithLibraries({library})));
   file.Install("lib/arm64/libfoo.so", library);
   EXPECT_EQ(file.SignJni(), 0U);
-  // The library gets the lowest free descriptor, which follows the package's.
+  // The library gets the lowest free descriptor: the package's descriptor plus 1.
   EXPECT_EQ(file.phone.events, Events({kSelf, SignEvent(file.fd() + 1)}));
   EXPECT_EQ(file.log.records(),
             Records({Starts(file.fd()), Info("VeltSignOat: Apk case.\n"), Finished()}));

@@ -1,4 +1,4 @@
-// Makes one chosen allocation fail, and counts the blocks that are freed before they are wiped.
+// Can make one chosen allocation fail, and counts the blocks that are freed before they are wiped.
 //
 // The test program must be linked with -Wl,--wrap=malloc,--wrap=free. Its own object files then
 // call the functions of failing_malloc.cpp, which call the real malloc and free. The platform's
@@ -23,7 +23,7 @@ class FailingMalloc {
   bool failed() const { return failing_call_ != 0 && calls_ >= failing_call_; }
   // The number of blocks that were returned and not yet freed.
   int live() const;
-  // The number of blocks that were freed.
+  // The number of watched blocks that were freed.
   int freed() const { return freed_; }
   // The number of freed blocks that still had bytes other than zero.
   int freed_unwiped() const { return freed_unwiped_; }

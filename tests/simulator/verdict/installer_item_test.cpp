@@ -95,8 +95,8 @@ TEST(InstallerItem, VerifierThatGaveUpIsARefusal) {
             "installer-gave-up: the installer's verifier gave up: it ended");
 }
 
-// A phone verifies only the newest of the package's schemes that the phone knows. All signers of
-// that scheme count.
+// A phone verifies only the newest of the package's schemes that the phone knows. OtherSigner
+// looks at all signers of that scheme.
 TEST(OtherSigner, IsOneOfTheNewestScheme) {
   Report report;
   report.signer = WithKey("own");
