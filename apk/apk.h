@@ -27,7 +27,7 @@ std::string SignatureBlockName(const std::string& signature_file_name);
 
 class Apk {
  public:
-  // The name of the manifest's entry. A program may set this pointer to another name.
+  // The name of the JAR manifest's entry. A program may set this pointer to another name.
   static const char* kMANIFEST_MF;
 
   explicit Apk(int fd) { Init(fd, nullptr); }
@@ -35,25 +35,27 @@ class Apk {
   Apk& operator=(const Apk&) = delete;
 
   // Opens the file as a zip archive. If its entry "AndroidManifest.xml" can be extracted, the
-  // archive is a package: Init then verifies its JAR signature and reads its manifests.
+  // archive is a package: Init then verifies its JAR signature. Init parses the package's manifests
+  // only if the signature verifies.
   //
   // `fd`: the file, open for reading. The caller keeps it open for the life of the object and
-  // closes it. If `fd` is -1, Init opens `path` itself. Release() closes Init's descriptor of a zip
-  // archive. Init's descriptor of any other file stays open until the process ends.
-  // `path`: the file's name. If `path` is null, Init uses the descriptor's name in /proc.
+  // closes it. If `fd` is -1, Init opens `path` itself. Release() closes a descriptor that Init
+  // opened for a zip archive. A descriptor that Init opened for any other file stays open until the
+  // process ends.
+  // `path`: the file's path. If `path` is null, Init asks the kernel for the path of `fd`.
   //
   // Verification fails without a message if the entry kMANIFEST_MF is missing or cannot be
   // extracted.
   //
-  // IsGoodZip, IsApk and IsGoodApk show the outcome. A second call first clears all flags. Other
-  // facts that the second call does not set keep their former values.
+  // IsGoodZip, IsApk and IsGoodApk show the outcome. A second call of Init first clears all flags.
+  // Other facts of the first file can stay (docs/decisions/second-init.md).
   void Init(int fd, const char* path);
 
   // Closes the archive, and its descriptor if Init opened the descriptor. The facts stay. The
   // caller must not read an entry afterwards. Release() does nothing if no archive is open.
   void Release() { CloseArchive(std::exchange(zip_handle_, nullptr)); }
 
-  // The path given to Init, or the descriptor's path; may be empty.
+  // The path given to Init, or the path that the kernel reported for `fd`; may be empty.
   const std::string& GetPath() const { return path_; }
   // The descriptor given to Init, or the result of Init's own open.
   int GetFd() const { return fd_; }
@@ -66,7 +68,9 @@ class Apk {
   // The signer's RSA modulus from the last signature block that InitCertSf verified. Empty if
   // InitCertSf verified no block. Big-endian; one leading zero byte is left out.
   const std::vector<uint8_t>& GetManufacturerKey() const { return manufacturer_key_; }
-  // The Android manifest was parsed, and asks for or declares the secure-storage permission.
+  // The Android manifest was parsed, and asks for secure storage: it requests or declares the
+  // secure-storage permission, or has a "meta-data" element with the name "access" and the value
+  // "SS_META".
   bool IsSsPermissionRequired() const { return ss_permission_required_; }
 
   // Iterate over the entries of the archive. Results are the zip library's codes (0: success). Apk
@@ -103,14 +107,14 @@ class Apk {
   // ("SHA1-Digest" or "SHA-256-Digest"). A mismatch is not logged.
   bool VerifyData(const std::string& digest_name, const std::vector<uint8_t>& expected,
                   const std::vector<uint8_t>& data);
-  // Reads the package name and the secure-storage permission from a compiled "AndroidManifest.xml".
-  // If the bytes are not compiled XML at all, returns false and changes nothing. Otherwise returns
-  // true.
+  // Sets the results of GetPackageName and IsSsPermissionRequired from a compiled
+  // "AndroidManifest.xml". If the bytes are not compiled XML at all, returns false and changes
+  // nothing. Otherwise returns true.
   bool ParseAndroidManifest(std::vector<uint8_t> bytes);
 
-  // True if Init verified the package, and "classes.dex" has the digest that the manifest records.
-  // A package without "classes.dex" needs no such check. The first call checks that entry; later
-  // calls return the same result.
+  // True if Init verified the package, and "classes.dex" is missing or has the digest that the
+  // manifest records. Only the first call after Init reads "classes.dex". Later calls return the
+  // same result.
   bool IsGoodApk();
   // True if `entry`, which the zip library found under `name`, has the digest that the manifest
   // records for `name`. Mismatches and failed extractions are not logged.

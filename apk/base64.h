@@ -16,5 +16,5 @@ std::vector<uint8_t> Base64Decode(const std::string& text);
 // skipped; the first '=' ends the text. Returns
 //   0: `*out_length` is now the number of bytes written;
 //   1: a character is not allowed, or `out` is too small. `*out_length` is unchanged, and `out`
-//      contains the bytes decoded before the failure.
+//      contains the bytes of the groups of four characters that were decoded before the failure.
 extern "C" int base64decode(const char* in, size_t length, uint8_t* out, size_t* out_length);

@@ -60,7 +60,7 @@ uint32_t VeltSignJni(ApkTools::Apk& apk, int fd, const char* /*path*/) {
 
 namespace {
 
-// Signs `fd`, which is the file of `apk` or an extracted library of `apk`.
+// Signs `fd`: the descriptor given to VeltSign, or an extracted library of the package `apk`.
 uint32_t VeltSignOat(ApkTools::Apk& apk, int fd) {
   return apk.IsApk() ? SignAsPackage(apk, fd) : SignAsJar(apk, fd);
 }
@@ -82,8 +82,8 @@ uint32_t SignAsPackage(ApkTools::Apk& apk, int fd) {
 
 uint32_t SignAsJar(ApkTools::Apk& apk, int fd) {
   LogInfo("VeltSignOat: non-Apk (Jar) case\n");
-  // Deliberate: the kernel must already trust the file that was opened as the archive. The kernel
-  // need not trust `fd`.
+  // Deliberate: the descriptor that the kernel must already trust is apk.GetFd(). `fd`, the
+  // descriptor to sign, is not verified. main() passes the same descriptor for both.
   uint32_t result = VeltVerifyFd(apk.GetFd());
   if (result != 0) {
     const int error = errno;

@@ -1,6 +1,6 @@
-// Lists the entries of a package, and compares them with their digests in the manifest. The tool's
-// own code finds and compares the digests. When the tool itself runs, it compares only a few
-// entries.
+// Lists the entries of a package, and compares them with their digests in the manifest. The
+// simulator calls the tool's functions to find and compare the digests. A run of the tool compares
+// only a few entries.
 #pragma once
 
 #include <cstdint>

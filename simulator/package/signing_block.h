@@ -34,7 +34,7 @@ inline constexpr uint64_t kMostBlockBytes = 16 << 20;
 
 // Returns the signing block of the archive that is open as `fd`, from the block's first size field
 // to its magic. Returns an empty text if the archive has no signing block, or if the block is
-// larger than kMostBlockBytes. Sets `*is_too_large` to true if the block is larger, otherwise to
+// larger than kMostBlockBytes. Sets `*is_too_large` to true in the second case, otherwise to
 // false.
 std::string ReadSigningBlock(int fd, const ArchiveEnd& end, bool* is_too_large);
 

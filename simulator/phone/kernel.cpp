@@ -2,9 +2,10 @@
 // has in the C library.
 //
 // This file, integrity_file.cpp, log.cpp and standard_output.cpp are parts of one library, which is
-// loaded before all others. The library replaces the functions by which the tool uses the phone's
-// kernel and log. It also records the tool's standard output. Calls that do not concern the phone
-// are passed, unchanged, to the function of the same name in a library that is loaded later.
+// loaded before all others. The library replaces the functions by which the tool uses the kernel's
+// integrity feature and the phone's log. It also records the tool's standard output. Calls that do
+// not concern the phone are passed, unchanged, to the function of the same name in a library that
+// is loaded later.
 #include <fcntl.h>
 #include <sys/mman.h>
 #include <sys/stat.h>
@@ -113,8 +114,8 @@ int CopyPayload(const void* argument, std::string* payload) {
 }
 
 // Copies `size` bytes from `from` to `to`. Returns false if the memory at `from` cannot be read.
-// That causes no signal, as in the kernel. The bytes go through a file, because pwrite reports
-// unreadable memory as an error, also under an emulator.
+// Unreadable memory causes no signal, as in the kernel. The bytes go through a file, because pwrite
+// reports unreadable memory as an error, also under an emulator.
 bool CopyIn(const char* from, size_t size, char* to) {
   const ssize_t wanted = static_cast<ssize_t>(size);
   return pwrite(Scratch(), from, size, 0) == wanted && pread(Scratch(), to, size, 0) == wanted;

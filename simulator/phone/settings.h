@@ -23,7 +23,8 @@ inline bool operator==(const FileId& a, const FileId& b) {
   return a.device == b.device && a.inode == b.inode;
 }
 
-// An element of `PhoneSettings::integrity`. An opening that gets this element fails with ENOENT.
+// If this text is next in `PhoneSettings::integrity` (below), opening /proc/PID/integrity/value
+// fails with ENOENT.
 inline constexpr char kMissing[] = "missing";
 
 struct PhoneSettings {

@@ -18,8 +18,8 @@ using kainjow::mustache::data;
 using kainjow::mustache::list;
 using kainjow::mustache::object;
 
-// The fields of the template's sections. Every text goes through Shown, and the template escapes
-// it.
+// These functions make the fields for the sections of the page's template (page.mustache). Every
+// text goes through Shown (page_fields.h), and the template escapes the text.
 data FileFields(const Report& report, size_t number, const PageRun& run);
 list HeadLines(const Report& report);
 void AddItems(const Report& report, data* file);
@@ -196,8 +196,8 @@ void AddSigners(const Report& report, data* file) {
   AddLines("signers", signers, "", make, file);
 }
 
-// Separates the names of options from the rest of a text of the simulator, because the page must
-// not break a line inside an option.
+// Separates options, such as --install=all, from the rest of `text`. The page must not break a line
+// inside an option.
 list Pieces(std::string_view text) {
   static const std::regex kOption("--[a-z][a-z-]*(=[A-Za-z]+)?");
   list pieces;

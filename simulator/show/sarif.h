@@ -1,12 +1,11 @@
 // The report of a run as one SARIF log (OASIS Static Analysis Results Interchange Format, version
-// 2.1.0), for programs that read results of static analysis. Each refused item of a file is a
-// result of level "error". An item that is refused only because of another cause
-// (Severity::kFollows) is left out if the file also has a refused item of another severity. Each
-// warning is a result of level "warning". The rules are the causes of the results
-// (simulator/verdict/causes.h). A file that was not looked at, or not simulated, is a notification
-// of level "error", and the run then counts as not successful. In messages, hidden characters
-// (IsHidden in simulator/phone/text.h) and bytes that are not UTF-8 become \xNN. In URIs, paths are
-// percent-encoded.
+// 2.1.0), for programs that read results of static analysis. A refused item of a file is a result
+// of level "error", with one exception: an item of severity kFollows (simulator/verdict/causes.h)
+// is left out if the file also has a refused item of another severity. Each warning is a result of
+// level "warning". The rules are the causes of the results. A file that was not looked at, or not
+// simulated, is a notification of level "error", and the run then counts as not successful. In
+// messages, hidden characters (IsHidden in simulator/phone/text.h) and bytes that are not UTF-8
+// become \xNN. In URIs, paths are percent-encoded.
 #pragma once
 
 #include <map>

@@ -1,5 +1,6 @@
-// Tests rsa_pkcs1_verify with signatures from libcrypto, and with encoded messages ("blocks") made
-// by hand. The tests apply only the private-key operation to a block. They add no padding.
+// Tests rsa_pkcs1_verify with signatures from libcrypto, and with encoded messages ("blocks") that
+// the tests make. A block already has its padding, so SignBlock applies only the private-key
+// operation.
 #include "crypto/rsa.h"
 
 #include <gtest/gtest.h>

@@ -14,7 +14,7 @@ using Lines = std::vector<std::string>;
 
 std::string Golden(const std::string& name) { return std::string(GOLDEN_PACKAGES) + "/" + name; }
 
-// The lines of `output` that have one of the labels, each from its label on.
+// The lines of `output` that have one of the labels, without the text before the label.
 Lines Labelled(const std::string& output) {
   const Lines labels = {"certificate DN: ", "certificate SHA-256 digest: ", "key algorithm: ",
                         "key size (bits): ", "public key SHA-256 digest: "};
@@ -84,8 +84,8 @@ TEST(Schemes, AreThoseThatTheFileCarries) {
   EXPECT_EQ(LineWith(Told("jarsigner-sha256"), "schemes:"), "    schemes: v1");
 }
 
-// The kernel gets the digest of the modulus alone. Other programs print the digest of the whole
-// public key.
+// The kernel gets the digest of the modulus alone. apksigner prints the digest of the whole public
+// key.
 TEST(KernelsDigest, IsThatOfTheModulusAlone) {
   const ProcessResult modulus = RunProcess({"cat", Golden("apksigner-sha256-2048/digest")});
   EXPECT_EQ(LineWith(Told("apksigner-sha256-2048"), "modulus SHA-256") + "\n",
@@ -107,9 +107,10 @@ TEST(SignerWarnings, SeveralSignersGiveAWarning) {
             "  ! it has more than one signer; the kernel gets the key of META-INF/CERT.SF alone");
 }
 
-// Phones that know the newest scheme use the package's new key. The tool uses the old key, that of
-// the JAR signature. apksigner signs with the new key in the newest scheme that apksigner knows:
-// v3, or v3.1 from version 32 of apksigner on.
+// The signer of the package "rotated-key" replaced an old key by a new key. The tool uses the old
+// key, which made the JAR signature. Phones that know the newest scheme use the new key. apksigner
+// signs with the new key in the newest scheme that apksigner knows: v3, or v3.1 from version 32 of
+// apksigner on.
 TEST(SignerWarnings, RotatedKeyGivesAWarning) {
   const std::string told = Told("rotated-key");
   const std::string schemes = LineWith(told, "schemes: ");

@@ -93,8 +93,9 @@ class Tree:
                 *(f"-I{directory}" for directory in directories)]
 
     def with_defaults(self, module):
-        """The module, merged with the modules in its "defaults". A list of the module is appended to
-        the lists of the defaults. Any other property of the module replaces theirs."""
+        """The module, merged with the modules in its "defaults". A list of the module is appended
+        to the defaults' lists of the same name. Any other property of the module replaces the
+        defaults' property of the same name."""
         merged = {}
         for part in [*map(self.with_defaults, self.named(module.get("defaults", []))), module]:
             for key, value in part.items():
@@ -110,7 +111,8 @@ class Tree:
                       for name in library.get("export_include_dirs", [])]
 
     def named(self, names):
-        """The modules in these files with these names. A name of a platform's module gives none."""
+        """The modules of this tree that have these names. A name that no module of this tree has,
+        for example the name of a platform's module, is skipped."""
         return [module for name in names for module in self.modules if module["name"] == name]
 
 
