@@ -199,7 +199,7 @@ void AddSigners(const Report& report, data* file) {
 // Separates options, such as --install=all, from the rest of `text`. The page must not break a line
 // inside an option.
 list Pieces(std::string_view text) {
-  static const std::regex kOption("--[a-z][a-z-]*(=[A-Za-z]+)?");
+  static const std::regex kOption("--[a-z][a-z0-9-]*(=[A-Za-z]+)?");
   list pieces;
   const auto add = [&pieces](const char* name, const std::string& piece) {
     if (!piece.empty()) pieces.push_back(object{{name, list{{"words", Shown(piece)}}}});

@@ -413,4 +413,7 @@ TEST(Page, KeepsOptionsOnOneLine) {
                   "extract libraries for 32-bit and 64-bit Arm, use <span "
                   "class=\"option\">--install=all</span>.</p>"));
   EXPECT_TRUE(Has(PageOf(report), ".option { white-space: nowrap; }"));
+  report.items = {Library("a", &cause::kUnsigned)};
+  EXPECT_TRUE(Has(PageOf(report),
+                  "apksigner sign <span class=\"option\">--v1-signing-enabled</span> true."));
 }
