@@ -1,6 +1,6 @@
 // Parses the text of a JAR manifest or signature file (JAR File Specification, "JAR Manifest" and
-// "Signed JAR File") into sections of attributes. The object owns the text; the names and values of
-// the attributes point into it. A syntax error in the text is logged, once per load().
+// "Signed JAR File") into sections of attributes. A ManifestMf owns the text; the names and values
+// of the attributes point into the text. A syntax error in the text is logged, once per load().
 #pragma once
 
 #include <cstdint>
@@ -22,8 +22,9 @@ class ManifestMf {
   ManifestMf& operator=(ManifestMf&&) = default;
 
   // Discards the former text and parses `text`, which may have any bytes. Returns false if `text`
-  // does not parse. The sections that ended before the fault are then kept. A text of 4 GiB or more
-  // is refused without a message. No entry of an archive is that long.
+  // does not parse. The sections that ended before the fault are then kept. Also returns false,
+  // without a message, for a text of 4 GiB or more. The tool never loads a text of this length,
+  // because a ZipEntry has lengths of 32 bits.
   bool load(std::vector<uint8_t> text);
   bool load(const std::string& text) {
     return load(std::vector<uint8_t>(text.begin(), text.end()));

@@ -1,5 +1,5 @@
-// The steps that bench_floor and bench_peer share. They are all of the tool's job except the
-// verification. Both programs are only for the good packages that bench_packages makes.
+// The steps that bench_floor and bench_peer share: all steps of the tool except digests and
+// verification. Both programs are only for the packages that bench_packages makes.
 #pragma once
 
 #include <cstdint>
@@ -8,8 +8,8 @@
 #include <string>
 #include <string_view>
 
-// A buffer that is used again and again. Resize() does not clear the bytes. A smaller size does not
-// free memory.
+// A buffer that can be used for one file after another. After Resize(), the values of all bytes are
+// undefined. A smaller size does not free memory.
 class Buffer {
  public:
   void Resize(size_t size);

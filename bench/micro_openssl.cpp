@@ -40,7 +40,7 @@ SignedMessage SignWithNewKey(unsigned bits) {
   return message;
 }
 
-// The time to load the key from its bytes into a new RSA object is included.
+// The measured time includes loading the key from its bytes into a new RSA object.
 void OpenSsl(benchmark::State& state) {
   const SignedMessage message = SignWithNewKey(static_cast<unsigned>(state.range(0)));
   for (auto _ : state) {

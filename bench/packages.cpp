@@ -1,8 +1,10 @@
 // bench_packages DIRECTORY: makes the packages that scripts/bench measures. Each package is
 // DIRECTORY/<name>/base.apk. Its libraries are extracted beside it, as an installer leaves them.
+// Does not make a package again if its base.apk exists.
 //
-// The contents are copied from the machine's own libraries and from the files of /usr/share. Zeros
-// or random bytes would not inflate at the same speed as the contents of a real package.
+// classes.dex and the packages' libraries have bytes of the machine's own libraries. The entries
+// below res/ and assets/ have bytes of files of /usr/share. Of all these entries, only classes.dex
+// is deflated. Zeros or random bytes would not inflate at the same speed as real code.
 #include <algorithm>
 #include <cstdio>
 #include <filesystem>
@@ -141,7 +143,8 @@ std::string EntryName(size_t index) {
   return kDirectories[index % 5] + std::string("entry_") + std::to_string(index) + ".bin";
 }
 
-// Adds the digests of the manifest's sections to the signature file, as signing tools do.
+// Makes MakePackage add the digests of the manifest's sections to the signature file, as signing
+// tools do. MakePackage then also writes the text of MANIFEST.MF to `manifest`.
 void DescribeEntries(PackageOptions& options, std::string& manifest) {
   options.edit_manifest = [&](const std::string& text) { return manifest = text; };
   options.edit_signature_file = [&](const std::string& text) {

@@ -18,6 +18,6 @@ int journal_open(void);
 void journal_sign(int fd, struct file *file, const void *payload, size_t size, int error);
 void journal_verify(int fd, struct file *file, int error);
 
-/* value: the integrity file that is opened. text: its contents without the line end, or NULL if the
- * file counts as missing. */
+/* value: the integrity file that a task opens. text: the file's contents without the line end, or
+ * NULL if the module lets this opening fail with ENOENT. */
 void journal_integrity(struct file *value, const char *text);

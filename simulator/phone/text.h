@@ -1,5 +1,6 @@
-// Texts in the journal and in settings: encodes any bytes as JSON strings, decodes these strings,
-// and splits lists. Nothing is kept or logged.
+// Functions for the texts of the journal and of settings. They encode any bytes as JSON strings or
+// in hexadecimal, decode the JSON strings, examine UTF-8 characters, and split lists. They keep no
+// state and log nothing.
 #pragma once
 
 #include <cstddef>
@@ -16,7 +17,8 @@ namespace simulator {
 // way, so that decoding is unambiguous.
 std::string EncodeText(std::string_view bytes);
 
-// The reverse of EncodeText. `utf8` is the text as a JSON reader returns it.
+// Returns the bytes that EncodeText encoded. `utf8` is the value that a JSON reader returns for the
+// result of EncodeText.
 std::string DecodeText(std::string_view utf8);
 
 // The lower-case hexadecimal digits of the bytes.

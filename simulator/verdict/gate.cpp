@@ -132,8 +132,9 @@ void Refuse(ItemKind kind, const char* name, const Reason& reason, Report* repor
   if (StatusOf(report->verdict) == kAllSigned) report->verdict = Verdict::kNotAccepted;
 }
 
-// The JAR signer. modulus_sha256 is the digest that the kernel got, or that the tool would send.
-// The other facts are those of report.signer if its modulus has this digest, and empty otherwise.
+// The JAR signer. key.modulus_sha256 is the digest that the kernel got, or that the tool would
+// send. If the modulus of report.signer has this digest, the other facts are those of
+// report.signer. Otherwise they are empty.
 CertificateFacts JarSigner(const Report& report) {
   CertificateFacts signer;
   const std::string modulus = report.key ? report.key->sha256 : "";
@@ -153,9 +154,9 @@ std::vector<const CertificateFacts*> NewestSigners(const RangeJudgement& range) 
   return signers;
 }
 
-// The signers for whom phones of any API level install the package, each once, in a fixed order. If
-// the installer did not judge the package: the signers of the newest scheme in the file, or the JAR
-// signer if the file has no scheme after v1.
+// The signers for whom phones of at least one API level install the package, each once, in a fixed
+// order. If the installer did not judge the package: the signers of the newest scheme after v1 in
+// the file, or the JAR signer if the file has no such scheme.
 Signers InstalledSigners(const Report& report) {
   Signers signers;
   for (const RangeJudgement& range : report.installer.ranges) {

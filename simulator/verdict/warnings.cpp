@@ -97,7 +97,7 @@ void WarnOfSigners(const PackageFacts& facts, const Report& report, Reasons* war
   }
 }
 
-// Gives one warning that lists the uses of SHA-1 and MD5 in the JAR signature and in the
+// Gives at most one warning, which lists the uses of SHA-1 and MD5 in the JAR signature and in the
 // certificates of all schemes. Collisions of these digests are known. MD5 digests in the manifest
 // and in the signature file are not listed, because the tool accepts no MD5 digests there.
 void WarnOfWeakDigests(const PackageFacts& facts, Reasons* warnings) {

@@ -13,8 +13,8 @@ constexpr char kSubjectAltName[] = "2.5.29.17";
 constexpr char kBasicConstraints[] = "2.5.29.19";
 constexpr char kUnknown[] = "1.2.3.4";
 
-// Returns the element with a length that is greater by `more`. The new length must be less than
-// 128, so that it is one octet.
+// Returns the element with `more` added to its length octet. All other octets stay as they are. The
+// new length must be less than 128, because DER encodes a greater length in more than one octet.
 Bytes RunningOn(Bytes element, size_t more = 1) {
   EXPECT_LT(element[1] + more, 0x80u);
   element[1] = static_cast<uint8_t>(element[1] + more);
@@ -104,9 +104,9 @@ TEST(X509TooLongElement, ElementsOfANameMayNotUseBytesAfterTheirContainer) {
   const Bytes rdn = der::Set({attribute});
   ASSERT_EQ(ResultOf(WithSubject(der::Sequence({rdn, rdn}))), 0);
   const Bytes cases[] = {
-      // an attribute that includes the SET after its own
+      // an attribute whose length includes the next SET
       der::Sequence({der::Set({RunningOn(attribute, rdn.size())}), rdn}),
-      // a value that includes the SET after its own
+      // a value whose length includes the next SET
       der::Sequence({der::Set({der::Sequence({type, RunningOn(Value(), rdn.size())})}), rdn}),
       // a value after its SEQUENCE, in the SET
       der::Sequence({der::Set({der::Sequence({type}), Value()})}),
