@@ -13,8 +13,8 @@ using Events = std::vector<nlohmann::json>;
 // The events of a journal's lines. Lines that are not JSON objects are not events and are skipped.
 Events ParseEvents(const std::string& journal);
 
-// The text of `event` under `key`, decoded to the bytes that were recorded (docs/journal.md, Texts).
-// Empty if the event has no such text.
+// The text of `event` under `key`, decoded to the bytes that were recorded (docs/journal.md,
+// Texts). Empty if the event has no such text.
 std::string TextOf(const nlohmann::json& event, const char* key);
 // The integer of `event` under `key`; 0 if the event has no such integer.
 int64_t NumberOf(const nlohmann::json& event, const char* key);

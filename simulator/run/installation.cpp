@@ -214,8 +214,8 @@ bool PutPackage(const std::string& file, int source, const std::string& copy,
   return size == 0;
 }
 
-// Returns 0, the errno of a failure to create or write the file, or -1 if the entry cannot be
-// extracted.
+// Returns 0 if the entry was extracted. If the file cannot be created or written, returns the
+// errno. If the entry cannot be extracted, returns -1.
 int Extract(const Archive& archive, const std::string& entry, const std::string& path,
             const Deadline& deadline) {
   constexpr mode_t kMode = 0755;

@@ -13,10 +13,11 @@ using simulator::RunInOrder;
 
 constexpr auto kTooLong = std::chrono::seconds(20);
 
-// Does nothing. A wait of more than a second is possible on a busy machine.
+// For calls about a wait. They are possible in every test, because a busy machine can take more
+// than a second for a run.
 void Ignore(size_t, int) {}
 
-// The first number ends last.
+// The run of number 0 waits until the run of number 3 has ended.
 TEST(Queue, ResultsAreDeliveredInTheOrderOfTheNumbers) {
   std::promise<void> last_has_run;
   std::vector<int> runs(4);
