@@ -90,6 +90,8 @@ LogLine ReadLogLine(const std::string& text) {
     if (is_cut ? start.empty() : !std::regex_match(text, match, pattern.whole)) continue;
     line.meaning = pattern.row->meaning;
     if (pattern.row->captured == kNothing) break;
+    // Only the first conversion of a cut text begins at a known place.
+    if (is_cut && pattern.row->captured != 0) break;
     line.text = is_cut ? line.whole.substr(start.size()) : match.str(pattern.row->captured + 1);
     const int base = pattern.conversion == 'X' ? 16 : 10;
     if (!is_cut && pattern.conversion != 's') {

@@ -103,6 +103,15 @@ TEST(ToolLogLine, TextThatWasCutIsKnownByItsStart) {
   EXPECT_EQ(ReadLogLine(std::string(1023, 'x')).meaning, LogMeaning::kUnknown);
 }
 
+// The number that this text captures comes after the file's name, which fills the rest of the text.
+TEST(ToolLogLine, LaterConversionOfACutTextIsNotCaptured) {
+  const std::string start = "OpenArchiveFd(12) [file: ";
+  const LogLine line = ReadLogLine(start + std::string(1023 - start.size(), 'x'));
+  EXPECT_EQ(line.meaning, LogMeaning::kNoArchive);
+  EXPECT_EQ(line.text, "");
+  EXPECT_EQ(line.number, 0);
+}
+
 TEST(ToolLogLine, WholeTextLosesItsLastLineEnd) {
   EXPECT_EQ(ReadLogLine("a\n\n").whole, "a\n");
   EXPECT_EQ(ReadLogLine("a").whole, "a");
