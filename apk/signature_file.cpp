@@ -20,7 +20,7 @@ int LoadKey(const std::vector<uint8_t>& block, const pkcs7& record, rsa_context&
 int VerifySignature(const rsa_context& key, const std::vector<uint8_t>& block,
                     const Digests& digests, const uint8_t* signature);
 
-// The longest modulus that becomes a manufacturer key, in bytes.
+// A modulus of more bytes does not become a manufacturer key.
 constexpr uint32_t kLongestKey = 2047;
 
 }  // namespace
@@ -111,8 +111,8 @@ bool Apk::ValidateManifest(const std::vector<uint8_t>& manifest) {
     const std::string digest_name(name.substr(0, name.size() - kManifest.size()));
     const std::vector<uint8_t> expected = Base64Decode(std::string(value));
     if (!expected.empty() && VerifyData(digest_name, expected, manifest)) return true;
-    // Deliberate: the first section with a digest of the manifest decides. If its digest is wrong,
-    // a later section does not count.
+    // Deliberate: the first section with a digest of the manifest decides. Later sections do not
+    // count, even if the digest in the first section is wrong.
     break;
   }
   LogError("Can't validate manifest.\n");
@@ -145,8 +145,8 @@ bool FitsInBlock(const std::vector<uint8_t>& block, const uint8_t* start, size_t
   return offset <= block.size() && length <= block.size() - offset;
 }
 
-// Loads the record's key into `key`. Returns rsa_set_key's result, or kRsaBadInput if the key
-// extends beyond the block or its exponent is 1 or -1.
+// Loads the record's key into `key`. Returns kRsaBadInput if the modulus extends beyond the block,
+// or if the exponent is 1 or -1. Otherwise returns the result of rsa_set_key.
 int LoadKey(const std::vector<uint8_t>& block, const pkcs7& record, rsa_context& key) {
   if (!FitsInBlock(block, record.modulus, record.modulus_length)) return kRsaBadInput;
   // Deliberate: the exponent's four bytes are read in host byte order, although certificates store

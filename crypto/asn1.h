@@ -49,10 +49,11 @@ struct asn1_oid {
 // failure.
 int asn1_get_next(const uint8_t* buf, size_t len, asn1_hdr* hdr);
 
-// Like asn1_get_next, for a caller that trusts the length of an outer element, even if the outer
-// element ends beyond the `available` bytes at `buf`. The element at `buf` must end within `bound`
-// bytes. Its header must also end within the `available` bytes. Its contents may end beyond the
-// `available` bytes, but the caller must not read beyond the `available` bytes.
+// Like asn1_get_next, but the element at `buf` must end within `bound` bytes. The element's
+// header must also end within the `available` bytes at `buf`. The element's contents may end beyond
+// the `available` bytes, but the caller must not read beyond the `available` bytes. This function
+// is for a caller that derives `bound` from the length of an outer element. The outer element may
+// end beyond the `available` bytes.
 int asn1_get_next_bounded(const uint8_t* buf, size_t available, size_t bound, asn1_hdr* hdr);
 
 // Decodes the `len` bytes at `buf`, the contents of an OBJECT IDENTIFIER (X.690 §8.19). Empty

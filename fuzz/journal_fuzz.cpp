@@ -1,6 +1,7 @@
 // A package influences names and texts in the journal of a run. This target calls the simulator's
-// functions for such texts. The first byte of the input selects what the rest of the input is: a
-// text to escape and read back, one line of the tool's log, or the journal of a whole run.
+// functions that escape, read and print these names and texts. The first byte of the input selects
+// what the rest of the input is: a text to escape and read back, one line of the tool's log, or the
+// journal of a whole run.
 #include <algorithm>
 #include <sstream>
 #include <string>
@@ -46,7 +47,7 @@ void JudgeLogLine(std::string_view bytes) {
   const std::string text(bytes);
   const LogLine line = ReadLogLine(text);
   Require(text.rfind(line.whole, 0) == 0 && text.size() - line.whole.size() <= 1,
-          "only the end of the line is cut off");
+          "at most the last byte of the line is cut off");
   Require(text.find(line.text) != std::string::npos, "captured text is a part of the line");
   const bool is_known = line.meaning != LogMeaning::kUnknown;
   Require(is_known || (line.text.empty() && line.number == 0),
@@ -81,7 +82,7 @@ void JudgeRecord(const Events& events) {
   }
   Require(is_signed == CountOf(events, "sign", true),
           "the record has as many signed files as the kernel signed");
-  Require(answers == CountOf(events, "sign", false), "each answer of the kernel is kept");
+  Require(answers == CountOf(events, "sign", false), "each answer to a sign command is kept");
   Require(record.registrations.size() == CountOf(events, "register", false),
           "each registration is kept");
   Require(record.verify_error != 0 || CountOf(events, "verify", true) > 0,

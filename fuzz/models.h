@@ -14,8 +14,9 @@ struct ManifestModel {
   std::vector<std::map<std::string, std::string>> sections;
 };
 
-// The sections of a JAR manifest or signature file. A section that no empty line ends is left out.
-// If the text is malformed, `valid` is false, and `sections` has the sections before the fault.
+// The sections of a JAR manifest or signature file. A section without an empty line after it
+// is left out. If the text is malformed, `valid` is false, and `sections` has the sections before
+// the fault.
 ManifestModel ReadManifest(const std::string& text);
 
 // The bytes that the base64 text encodes, or nothing if base64decode() refuses a character.

@@ -5,8 +5,8 @@
 namespace {
 
 // The names of the error numbers from 1 on, as Linux numbers them on Arm and x86. "-" marks a
-// number without a name. If a number has two names, such as EAGAIN and EWOULDBLOCK, the list has
-// the name that the kernel's headers define as the number.
+// number without a name. Some numbers have a second name, which the kernel's headers define as
+// the first name: EWOULDBLOCK is defined as EAGAIN. The list has only the first name.
 constexpr char kNames[] =
     "EPERM ENOENT ESRCH EINTR EIO ENXIO E2BIG ENOEXEC EBADF ECHILD EAGAIN ENOMEM EACCES EFAULT "
     "ENOTBLK EBUSY EEXIST EXDEV ENODEV ENOTDIR EISDIR EINVAL ENFILE EMFILE ENOTTY ETXTBSY EFBIG "

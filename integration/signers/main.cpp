@@ -4,12 +4,13 @@
 //
 // Of a package's signature schemes, the package manager uses the newest one that it knows. This can
 // be a scheme of the APK signing block (v2 or later). apktoolkit always uses the JAR signature.
-// Neither the package manager nor apktoolkit compares the two signers (docs/threat-model.md,
-// "Before you ship it"). DIGESTS comes from SignerDigests.java: for each RSA signer that the
-// package manager knows, the SHA-256 digest of the modulus, in lower-case hexadecimal, separated by
-// commas. This program finds the JAR signer with the tool's own code, so it finds the same signer
-// as the tool. This program is separate from its caller for two reasons. The tool's code ends the
-// process if memory runs out. The tool's code also does not free all of its memory.
+// Neither the package manager nor apktoolkit compares the signer of that scheme with the JAR signer
+// (docs/threat-model.md, "Before you ship it"). DIGESTS is a comma-separated list that
+// SignerDigests.java makes. For each RSA signer that the package manager knows, the list has the
+// SHA-256 digest of the modulus, in lower-case hexadecimal. This program finds the JAR signer with
+// the tool's own code, so it finds the same signer as the tool. This program is separate from its
+// caller for two reasons. The tool's code ends the process if memory runs out. The tool's code also
+// does not free all of its memory.
 #include <fcntl.h>
 #include <unistd.h>
 
@@ -27,18 +28,19 @@
 
 namespace {
 
-// The exit statuses of this program. The command, apktoolkit, ends with 0 or 1, so this program
-// uses other numbers.
+// The exit statuses of this program. They differ from 0 and 1, the exit statuses of apktoolkit,
+// which is the usual COMMAND.
 constexpr int kUsageError = 2;
 constexpr int kOtherSigner = 3;
 constexpr int kNoJarSigner = 4;
 constexpr int kNotStarted = 5;
 
-// Returns the digest of the signer's key. The tool passes the same digest to the kernel. Returns an
-// empty text if the file cannot be opened, is not a package, or has no readable
-// META-INF/MANIFEST.MF. Also returns an empty text if the signature of the first signature file is
-// missing or does not verify. Does not check the digests that the signature file and the manifest
-// contain.
+// Returns the SHA-256 digest of the JAR signer's modulus, in lower-case hexadecimal. The tool
+// passes the same digest to the kernel. Returns an empty text if the file cannot be opened, is not
+// a package, or has no readable META-INF/MANIFEST.MF. Also returns an empty text if the first
+// signature file is missing or malformed, or if the signature of this signature file is missing or
+// does not verify. A wrong digest in the signature file or in the manifest does not change the
+// result.
 std::string JarSigner(const char* file) {
   const ScopedFd fd(OpenForReading(file, O_CLOEXEC));
   if (fd.get() < 0) return {};

@@ -1,6 +1,6 @@
 // The judgement of apksig, the platform's own verifier: whether a phone's installer installs the
 // package. apksig runs in a separate program. A hostile file can influence the answer of this
-// program. The answer is therefore not trusted: a malformed answer counts as no answer.
+// program. The form of each answer is therefore checked. A malformed answer counts as no answer.
 #pragma once
 
 #include <climits>
@@ -27,7 +27,7 @@ struct InstallerIssue {
   std::string text;  // apksig's own sentence
 };
 
-// A signer of one verified scheme.
+// A signer of the package in one verified signature scheme.
 struct InstallerSigner {
   std::string scheme;  // "v1", "v2", "v3" or "v3.1"
   CertificateFacts certificate;
@@ -46,14 +46,14 @@ struct RangeJudgement {
 struct Judgement {
   enum class State {
     kNotAsked,  // the verifier was not asked, for example because the file is not a package
-    kMissing,   // the verifier is not installed
-    kGaveUp,    // the verifier gave no valid answer, or no answer before the deadline
+    kMissing,   // Java, apksig or the program that calls apksig is missing
+    kGaveUp,    // the verifier gave no valid answer before the deadline
     kJudged,
   };
 
   State state = State::kNotAsked;
   std::string why;                     // the reason, for kMissing and kGaveUp
-  std::vector<RangeJudgement> ranges;  // sorted by level; each begins just after the one before it
+  std::vector<RangeJudgement> ranges;  // from low to high levels, without gaps or overlaps
 };
 
 // Parses one line of the verifier's output. The result's state is kJudged or kGaveUp.

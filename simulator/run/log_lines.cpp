@@ -14,8 +14,9 @@ namespace {
 
 constexpr size_t kNothing = SIZE_MAX;
 
-// The format texts with which the tool's sources write the log. `captured` is the index of the
-// conversion to capture, counted from 0.
+// The format texts of the tool's log that have a meaning for the simulator. `captured` is the
+// index, counted from 0, of the conversion whose text is stored in LogLine::text. If `captured` is
+// kNothing, LogLine::text stays empty.
 constexpr struct LogText {
   LogMeaning meaning;
   const char* format;

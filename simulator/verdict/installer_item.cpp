@@ -1,5 +1,5 @@
-// The report's item about the judgement of the phones' installer, and other results from this
-// judgement.
+// Uses apksig's judgement of the package for the report: adds an item, writes texts, and finds a
+// signer other than the JAR signer.
 #include <algorithm>
 
 #include "simulator/verdict/parts.h"
@@ -50,9 +50,10 @@ std::string TakersText(const Judgement& judgement) {
          Joined(schemes);
 }
 
-// Phones verify only the newest of the package's signature schemes that they know. Therefore only
-// the signers of the newest scheme are compared with the JAR signer. The last range that installs
-// the package decides, because this range contains the newest phones.
+// A phone verifies only one of the package's signature schemes: the newest that the phone knows.
+// Therefore, for each range of API levels, only the signers of the newest verified scheme are
+// compared with the JAR signer. The result is for the newest phones that install the package, so
+// each verified range replaces the result of the earlier ranges.
 const CertificateFacts* OtherSigner(const Judgement& judgement, const Report& report) {
   const CertificateFacts* other = nullptr;
   for (const RangeJudgement& range : judgement.ranges) {

@@ -76,7 +76,7 @@ TEST(EntryDigests, LastSectionWithTheNameCounts) {
 }
 
 // By chance, an unstable sort can keep a few sections with equal names in order. With 50 sections
-// of each name, this is very unlikely.
+// of the same name, this is very unlikely.
 TEST(EntryDigests, LastOf50SectionsWithTheNameCounts) {
   std::string sections = Section("z", "0");
   for (int i = 1; i <= 100; ++i) sections += Section(i % 2 == 0 ? "a" : "b", std::to_string(i));
@@ -88,9 +88,9 @@ TEST(EntryDigests, LastOf50SectionsWithTheNameCounts) {
 
 // A name of these letters, each followed by 63 slashes.
 //
-// The hash of a name is rotated by 9 bits before each byte. 64 rotations are 576 bits, 9 full turns
-// of the 64-bit hash. Bytes at a distance of 64 are therefore combined with the same bits of the
-// hash, and their order does not change the hash.
+// EntryDigests rotates the hash of a name by 9 bits before it combines the hash with the next byte.
+// 64 rotations are 576 bits, 9 full turns of the 64-bit hash. Bytes at a distance of 64 are
+// therefore combined with the same bits of the hash, and their order does not change the hash.
 std::string With64Between(const std::string& letters) {
   std::string name;
   for (const char letter : letters) name += letter + std::string(63, '/');
@@ -98,8 +98,8 @@ std::string With64Between(const std::string& letters) {
 }
 
 // In the first family, all names have the same hash. In the second, the three long names have the
-// same hash. In the third, the two names of 8 characters have the same hash, and the two long names
-// have the same hash. In the names of 8 characters, seven rotations follow the first character.
+// same hash. In the third, the two names of 8 characters share one hash, and the two long names
+// share another hash. In the names of 8 characters, seven rotations follow the first character.
 // These rotations move the first character by 63 bits to the left, which equals one bit to the
 // right. "b" (0x62) becomes 0x31, and "d" (0x64) becomes 0x32. The result is then combined with the
 // eighth character by XOR: 0x31 ^ "q" (0x71) and 0x32 ^ "r" (0x72) are both 0x40. The six

@@ -69,10 +69,10 @@ std::vector<std::string> ShortNames(size_t count) {
   return names;
 }
 
-// A sort compares each name with about log2(4096) = 12 others. In this test, the names are sorted
-// again before the end of the section only after their number has more than doubled. At the end of
-// the section, the names are sorted once more. All sorts together need about twice the comparisons
-// of the last sort: about 24 for each name. This test allows 48 for each name.
+// A sort compares each name with about log2(4096) = 12 others. ManifestSections::add() sorts the
+// names from time to time. In this test, the number of names more than doubles between two of these
+// sorts. endSection() sorts the names once more. All sorts together need about twice as many
+// comparisons as the last sort: about 24 for each name. This test allows 48 for each name.
 TEST_F(JarManifestCalls, ShuffledNamesNeed12To48ComparisonsEach) {
   std::vector<std::string> names = ShortNames(4096);
   std::shuffle(names.begin(), names.end(), std::mt19937(1));
@@ -145,7 +145,7 @@ TEST_F(JarManifestCalls, NamesInOrderAreNotHashed) {
   EXPECT_GT(in_order, 12u);
 }
 
-// ---- Continuation lines. The parser moves each of them to the end of the line before it.
+// ---- Continuation lines. The parser moves each of them to the end of a value that is not empty.
 
 TEST_F(JarManifestCalls, LinesThatOverlapTheirNewPlaceAreMovedWhole) {
   std::string value;

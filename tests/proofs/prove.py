@@ -94,8 +94,8 @@ def half_digit_is_quotient_and_remainder():
         given_back = z3.If(less == 0, 0, z3.If(less == 1, wide(d), 2 * wide(d)))
         always(holds, z3.ULE(less, 2), z3.ULT(remainder.term, d.term),
                wide(remainder) == difference + given_back)
-    # The remainder is below d, so the digit is the quotient. The dividend is below d * 2^16, so the
-    # digit fits in half a limb.
+    # The dividend is digit * d + remainder, and the remainder is below d. The digit is therefore
+    # the quotient. The dividend is below d * 2^16, so the digit fits in half a limb.
     always(given, z3.ULT((wide(rest) << 16) + wide(half), wide(d) << 16))
 
 
@@ -141,10 +141,11 @@ class Montgomery:
 
 
 def windows_make_up_the_exponent():
-    """After every window, and after every zero between windows, `nbits` and `wbits` of `raise` are
-    0 again. The exponents that are checked here contain each pair of windows, with and without a
-    zero between the two windows. These exponents therefore stand for all exponents. In the shifted
-    exponents, some windows cross the border between two limbs."""
+    """Besides the power, `raise` keeps only `nbits` and `wbits` from one exponent bit to the next.
+    Both are 0 after every window, and after every zero between windows. The exponents that are
+    checked here contain each pair of windows, with and without a zero between the two windows.
+    These exponents therefore stand for all exponents. In the shifted exponents, some windows cross
+    the border between two limbs."""
     function = load("crypto/mpi_pow_mod.cpp", "raise", kMpiLimbBits=LIMB_BITS,
                     mpi_msb=lambda number: number.value.bit_length())
     for w in (1, 3, 4, 5, 6):

@@ -29,8 +29,9 @@ ssize_t __wrap_readlink(const char* path, char* buffer, size_t size) {
   return kernel.readlink ? kernel.readlink(buffer, size) : __real_readlink(path, buffer, size);
 }
 
-// In a build with _FORTIFY_SOURCE, calls of read and readlink become calls of these functions.
-// Every platform tree defines _FORTIFY_SOURCE.
+// In a build with _FORTIFY_SOURCE, calls of read and readlink can become calls of __read_chk and
+// __readlink_chk. The linker redirects these calls to the two functions below. Every platform
+// tree defines _FORTIFY_SOURCE.
 ssize_t __wrap___read_chk(int fd, void* buffer, size_t size, size_t /*room*/) {
   return __wrap_read(fd, buffer, size);
 }

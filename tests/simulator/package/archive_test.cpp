@@ -158,7 +158,8 @@ TEST(Archive, SurvivesAFileThatShrinks) {
   EXPECT_FALSE(archive.HasShrunk());
 }
 
-// A SIGBUS ends the process if no ShrinkGuard exists.
+// The page is beyond the end of an empty file, so a read of the page raises SIGBUS. SIGBUS ends the
+// process if no ShrinkGuard exists.
 TEST(ShrinkGuardDeathTest, GuardsOnlyWhileItExists) {
   const auto touch = [](bool guarded) {
     const int fd = memfd_create("page", MFD_CLOEXEC);
@@ -189,9 +190,9 @@ TEST(ArchiveEnd, IsTheLastMarkThatHasRoomForARecord) {
   EXPECT_EQ(end_of(""), 1);
   EXPECT_EQ(end_of("a comment"), 1);
   EXPECT_EQ(end_of(std::string(65535, 'c')), 1);
-  // This mark in the comment is followed by one byte too few for a record, so it does not count.
+  // The end record's signature, PK\5\6, does not count here: one byte too few for a record follows.
   EXPECT_EQ(end_of(std::string("PK\5\6") + std::string(17, '\0')), 1);
-  // This mark begins a whole record, so it counts as the end, as in the platform's library.
+  // Here the signature begins a whole record, so it counts, as in the platform's library.
   EXPECT_EQ(end_of(std::string("PK\5\6") + std::string(18, '\0')), 0);
 }
 

@@ -46,7 +46,7 @@ std::vector<std::string> LaidOutOf(const PackageOptions& package, InstalledAbi a
   return files;
 }
 
-// Like LaidOutOf, for a package with these libraries.
+// Like LaidOutOf, for a package with the entries in `libraries`.
 std::vector<std::string> LaidOut(const std::vector<ZipItem>& libraries, InstalledAbi abi,
                                  std::vector<std::string>* left_out = nullptr) {
   return LaidOutOf(WithLibraries(libraries), abi, left_out);
@@ -213,8 +213,8 @@ TEST(Installation, SaysWhenItCannotWrite) {
 
 // A write lease (F_SETLEASE) delays every other open() of the file. With the flag O_NONBLOCK,
 // open() fails at once instead. LayOut() opens the package with this flag. If open() fails, the
-// package stays where it is. In a whole run, the tool then waits for the end of the lease, and the
-// report names the lease.
+// package stays where it is. In a whole run, the tool then opens the package, and waits for the end
+// of the lease.
 TEST(Installation, DoesNotWaitForALease) {
   const TempDir directory;
   const std::string file = directory / "base.apk";
@@ -295,7 +295,7 @@ TEST(Installation, ReportsAMissingTemporaryDirectory) {
   EXPECT_EQ(problem.value_or("").substr(0, 8), "TMPDIR: ");
 }
 
-// An interruption ends LayOut() at once, even before the deadline.
+// After an interruption (here SIGTERM), the next write of LayOut() fails, even before the deadline.
 TEST(Installation, FailsAfterAnInterruption) {
   const TempDir directory;
   const std::string file = directory / "base.apk";
@@ -388,6 +388,6 @@ TEST(Installation, ItsPathsAreStable) {
   const std::string place = fs::path(installation.path()).parent_path().string();
   EXPECT_EQ(installation.WithStablePaths("a " + place + "/lib/x.so b " + place + "/base.apk"),
             "a <install>/lib/x.so b <install>/base.apk");
-  // Only the path of the directory itself is replaced, and not a longer name that begins with it.
+  // The path of another directory is kept, even if it begins with the text of `place`.
   EXPECT_EQ(installation.WithStablePaths(place + "x/<install>/lib"), place + "x/<install>/lib");
 }

@@ -1,7 +1,7 @@
-// The platform zip library as in API level 27: names are ZipString, handles are void*, and a
-// missing filter is a null pointer. With the preset `zipstring`, the compiler finds this header
-// instead of the library's own. The tool and its tests are then built and run with this older
-// interface.
+// The interface of the platform's zip library in API level 27: names have the type ZipString,
+// handles have the type void*, and an absent prefix or suffix is a null pointer. With the preset
+// `zipstring`, the compiler finds this header instead of the library's own. The tool and its tests
+// are then built and run with this older interface.
 //
 // zipstring_library.cpp defines only the parts that differ from the installed library, and calls
 // that library.
