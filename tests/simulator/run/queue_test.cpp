@@ -13,8 +13,8 @@ using simulator::RunInOrder;
 
 constexpr auto kTooLong = std::chrono::seconds(20);
 
-// For calls about a wait. They are possible in every test, because a busy machine can take more
-// than a second for a run.
+// For the parameter `waiting` of RunInOrder. On a busy machine, a run can take more than a second.
+// RunInOrder then calls `waiting`.
 void Ignore(size_t, int) {}
 
 // The run of number 0 waits until the run of number 3 has ended.
@@ -39,7 +39,8 @@ TEST(Queue, CallsNothingIfThereAreNoNumbers) {
   RunInOrder(0, 2, never, never, Ignore);
 }
 
-// `waiting` can block, for example if nobody reads the terminal. The other runs must then continue.
+// RunInOrder's `waiting` can block, for example if nobody reads the terminal. The other runs must
+// then continue.
 TEST(Queue, RunsContinueDuringACallAboutAWait) {
   std::promise<void> is_told, next_has_begun;
   bool is_first = true;
