@@ -1,9 +1,9 @@
 # The platform's own libraries. By default, these are Debian's builds for a workstation: headers
-# under /usr/include/android, libraries in `android/` of the multiarch directory. CMake treats the
-# headers as system headers, because the project cannot fix their warnings about the `cfi`
-# attribute. /usr/include/android also has the headers of the platform's `libcrypto`. OpenSSL's
-# headers in /usr/include can have the same names, so the compiler searches /usr/include/android
-# first.
+# under /usr/include/android, libraries under /usr/lib/<architecture>/android. The libraries are
+# imported targets. CMake therefore treats their headers as system headers. The compiler then does
+# not print the headers' warnings about the `cfi` attribute. /usr/include/android also has the
+# headers of the platform's `libcrypto`. OpenSSL's headers in /usr/include can have the same names,
+# so the compiler searches /usr/include/android first.
 set(PLATFORM_INCLUDE_DIR ${CMAKE_SYSROOT}/usr/include/android CACHE STRING
   "Headers of the platform libraries: one directory, or a list of them")
 set(PLATFORM_LIBRARY_DIR ${CMAKE_SYSROOT}/usr/lib/${CMAKE_LIBRARY_ARCHITECTURE}/android CACHE PATH

@@ -1,8 +1,9 @@
 // An example of a program that links the tool's verification. Prints whether a package has a good
-// JAR signature, and the digest of the JAR signer's key. Signs nothing. If a package has a newer
-// signature (v2, v3), phones from Android 7 on take the signer from the newer signature. This
-// program does not read newer signatures. README.md in this directory shows how to compare the two
-// signers.
+// JAR signature. If the signature is good, also prints the package's name and the digest of the JAR
+// signer's key. Signs nothing. A package can also have a newer signature: v2 for phones from
+// Android 7 on, v3 for phones from Android 9 on. These phones take the signer from the newer
+// signature. This program does not read newer signatures. README.md in this directory shows how to
+// compare the signers.
 #include <fcntl.h>
 #include <unistd.h>
 

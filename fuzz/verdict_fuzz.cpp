@@ -188,7 +188,7 @@ void JudgeItems(const Run& run, const Report& report) {
   size_t done = 0;
   for (const Item& item : report.items) {
     Require((item.reason.cause == nullptr) == (item.state == ItemState::kDone),
-            "an item has a cause unless it is done");
+            "an item has no cause if and only if it is done");
     if (item.state != ItemState::kDone) continue;
     if (item.kind != ItemKind::kKey) ++done;
     const auto& names = run.registered;
@@ -225,7 +225,7 @@ void JudgeShown(const Report& report) {
   const std::string digest = report.key && why.empty() ? report.key->sha256 : "";
   Require(head.find(Printable(why, Look())) != std::string::npos, "the decisive reason is shown");
   Require(!why.empty() || (key != std::string::npos) == !digest.empty(),
-          "a line without a reason shows a key if and only if the report has one");
+          "a line without a reason shows a key if and only if the report has a key");
   Require(digest.empty() || head.compare(key + 6, 8, digest, 0, 8) == 0,
           "the shown key is the reported key");
   const bool is_got = all.str().find("what the kernel got") != std::string::npos;
@@ -233,13 +233,14 @@ void JudgeShown(const Report& report) {
           "the text says whether the kernel got the key");
   const bool is_alarmed = HasWarning(report, cause::kCertificateOtherKey);
   Require(!is_alarmed || head.find("   ! ") != std::string::npos,
-          "the verdict's line has the warning that the certificate has another key");
+          "if the certificate has another key, a warning is printed with the verdict");
 
   const json event = json::parse(VerdictEvent(report));
   Require(event["payload"] == report.payload, "the event has the payload");
   Require(event["status"] == static_cast<int>(StatusOf(report.verdict)),
           "the event has the status");
-  Require(event["items"].size() == report.items.size(), "the event has each item");
+  Require(event["items"].size() == report.items.size(),
+          "the event has as many items as the report");
 }
 
 }  // namespace

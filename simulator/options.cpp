@@ -123,8 +123,8 @@ std::optional<int> ParseOptions(int argc, char** argv, Options* options) {
 
 namespace {
 
-// The command line in reverse order, as CLI11 expects it. An --install without a value gets the
-// default value. Otherwise CLI11 would use the next word, for example a file, as the value.
+// The command line in reverse order, as CLI11 expects it. An --install without a value becomes
+// --install=phone. Otherwise CLI11 would use the next word, for example a file, as the value.
 std::vector<std::string> CommandLineOf(int argc, char** argv) {
   std::vector<std::string> words(argv + std::min(argc, 1), argv + argc);
   const auto end_of_options = std::find(words.begin(), words.end(), "--");
@@ -285,7 +285,8 @@ void AddOutput(CLI::App* app, Options* options) {
   app->add_option("--journal", options->show.journal, "Write the journal to FILE; - is like --json")
       ->type_name("FILE")
       ->check(WhyNoName);
-  // Standard output has the verdicts, so a JUnit, SARIF or HTML document there would be malformed.
+  // Standard output has the verdicts or the journal. A JUnit, SARIF or HTML document there would
+  // therefore be malformed.
   const auto is_no_stream = [](const std::string& path) {
     return std::string(
         path == "-" ? "it cannot be written to standard output; for a file named -, write ./-"

@@ -45,7 +45,7 @@ MODULE_PARM_DESC(integrity, "contents of the integrity file, one for each openin
 
 static int sign_errno;
 module_param(sign_errno, int, 0644);
-MODULE_PARM_DESC(sign_errno, "errno of a valid request to sign; 0: the file is signed");
+MODULE_PARM_DESC(sign_errno, "errno of a valid request to sign; 0: the module tries to sign the file");
 
 static int verify_errno = ENOKEY;
 module_param(verify_errno, int, 0644);

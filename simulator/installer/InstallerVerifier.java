@@ -3,7 +3,7 @@
 // Arguments: the first and the last API level of the phones. Standard input: the paths of packages,
 // one per line. The answer to each path is one line on standard output, a JSON object in ASCII. The
 // program ends at the end of its input. The member "ranges" of the object has the answers for
-// ranges of API levels. If the verifier has no answer, the object has only "failure", the reason.
+// ranges of API levels. After a failure, the object has only the member "failure", the reason.
 
 import com.android.apksig.ApkVerifier;
 import com.android.apksig.apk.ApkFormatException;
@@ -49,7 +49,7 @@ public final class InstallerVerifier {
     public static void main(String[] arguments) throws Exception {
         int first = Integer.parseInt(arguments[0]);
         int last = Integer.parseInt(arguments[1]);
-        // Standard output must have only answers. All other output is dropped.
+        // Standard output must have only answers. Output of apksig to System.out is dropped.
         PrintStream answers = System.out;
         System.setOut(new PrintStream(OutputStream.nullOutputStream()));
         BufferedReader paths =
@@ -76,7 +76,7 @@ public final class InstallerVerifier {
         }
     }
 
-    // The lowest level at which phones install the package; 1 if the manifest cannot be read.
+    // The lowest API level that the manifest allows; 1 if the manifest cannot be read.
     private static int lowestLevel(DataSource source) {
         try {
             return ApkUtils.getMinSdkVersionFromBinaryAndroidManifest(
@@ -116,8 +116,8 @@ public final class InstallerVerifier {
         return list(told);
     }
 
-    // Divides the levels into ranges, which begin at `first` and at each of the `starts`. Verifies
-    // each range.
+    // Divides the levels from `first` to `last` into ranges. One range begins at `first`, and one
+    // at each later level in `starts`. Verifies each range.
     private static List<Range> verifyEach(DataSource source, int first, int last,
             SortedSet<Integer> starts, boolean hasNewer) throws Exception {
         List<Range> ranges = new ArrayList<>();
@@ -153,7 +153,7 @@ public final class InstallerVerifier {
         }
     }
 
-    // The answer for the phones of some levels.
+    // The answer for the phones of the levels from `first` to `last`.
     private static final class Range {
         final int first;
         int last;
@@ -174,9 +174,9 @@ public final class InstallerVerifier {
     // Returns the verifier's answer for these levels. Phones of API 30 and later require v2 or
     // later if the app targets 30 or later. The verifier checks this rule only if the range ends at
     // the app's target level or later. If the package has neither v3 nor v3.1, a range that ends at
-    // 30 or later is therefore verified without an upper end. The missing end changes no other
-    // answer for this package. A package with v3 or v3.1 is verified with the exact end, because
-    // its signers can be for some levels only.
+    // 30 or later is therefore verified without an upper end. For this package, the missing end
+    // changes nothing else in the answer. A package with v3 or v3.1 is verified with the exact end,
+    // because its signers can be for some levels only.
     private static Range verify(DataSource source, int first, int last, boolean hasNewer)
             throws Exception {
         if (first >= KNOWS_V31 && !hasMethod(ApkVerifier.Result.class, "isVerifiedUsingV31Scheme")
@@ -212,7 +212,8 @@ public final class InstallerVerifier {
             }
             malformed.add(issue("MALFORMED_APK", new Object[0], exception.getMessage()));
         } catch (RuntimeException exception) {
-            // The verifier throws this if no signature of the package is for these levels.
+            // If no signature of the package is for these levels, the verifier throws an exception
+            // with this message.
             if (!String.valueOf(exception.getMessage()).startsWith("APK verified, but has not")) {
                 throw exception;
             }
@@ -225,7 +226,8 @@ public final class InstallerVerifier {
         return range;
     }
 
-    // True if the file could be read, but the data of an entry are longer than the entry states.
+    // True if the cause of the exception is an entry whose data are longer than the entry states.
+    // In this case, the file itself could be read.
     private static boolean isOfDamagedData(Throwable failure) {
         for (Throwable cause = failure; cause != null; cause = cause.getCause()) {
             if (cause instanceof BufferOverflowException) {
@@ -412,7 +414,7 @@ public final class InstallerVerifier {
         return "[" + String.join(",", values) + "]";
     }
 
-    // The text may contain a name from the file. The name can be invalid UTF-16.
+    // `words` may contain a name from the package. This name can be invalid UTF-16.
     private static String text(String words) {
         String all = words == null ? "" : words;
         StringBuilder json = new StringBuilder("\"");

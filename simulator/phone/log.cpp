@@ -1,4 +1,5 @@
-// The Android log of the phone: the records of the tool and of the platform libraries that it uses.
+// The Android log of the phone: the records of the tool and of the platform libraries that the
+// tool uses.
 #include "simulator/phone/log_library.h"
 
 #include <cstdarg>

@@ -177,8 +177,8 @@ void Simulator::RememberSigned(const Events& events, Task* task) {
   }
 }
 
-// After the deadline or an interruption, every failure is reported as a timeout or as the
-// interruption.
+// After an interruption, every failure becomes kInterrupted. After the deadline, if there was no
+// interruption, every failure becomes kTimedOut.
 void Simulator::Fail(Failure::Kind kind, const std::string& detail, Task* task) const {
   task->failure = {kind, detail};
   if (!task->deadline.HasPassed()) return;

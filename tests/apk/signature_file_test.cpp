@@ -160,8 +160,9 @@ Records RefusedTwice() {
   return {Error("Can't validate manifest.\n"), Error("Can't validate manifest.\n")};
 }
 
-// A section without its end. For each name in `right`, it has the digest of the package's manifest.
-// For each name in `wrong`, it has the digest of no bytes. Each name gets the suffix "-Manifest".
+// A section without the empty line at its end. For each name in `right`, it has the digest of the
+// package's manifest. For each name in `wrong`, it has the digest of empty data. Each name gets the
+// suffix "-Manifest".
 JarText ManifestDigests(const std::vector<std::string>& right,
                         const std::vector<std::string>& wrong) {
   const Bytes manifest = MakePackage().Item(kManifestName).data;

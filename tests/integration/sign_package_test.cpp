@@ -1,5 +1,5 @@
-// Runs the code of integration/caller with real programs in the simulated phone, which remembers
-// signed files.
+// Runs the code of integration/caller. Scripts run the real apktoolkit and apktoolkit-verify in the
+// simulated phone, which remembers signed files. Some tests replace or remove programs.
 #include "integration/caller/sign_package.h"
 
 #include <gtest/gtest.h>
@@ -57,7 +57,7 @@ TEST_F(Phone, SignsAPackageOnce) {
   EXPECT_EQ(Sign(package), SignOutcome::kTrusted);
   EXPECT_TRUE(IsTrusted(package.path));
   EXPECT_TRUE(IsTrusted(fs::path(package.path).parent_path() / "lib/arm64/libvault.so"));
-  InstallProgram("apktoolkit", "exit 1");  // signed packages need no run
+  InstallProgram("apktoolkit", "exit 1");  // must not run for a signed package
   EXPECT_EQ(Sign(package), SignOutcome::kTrustedAlready);
 }
 
@@ -87,7 +87,8 @@ TEST_F(Phone, DoesNotTrustAPackageThatTheKernelRefuses) {
   EXPECT_EQ(Sign(Install("apksigner-sha256-2048")), SignOutcome::kNotTrusted);
 }
 
-// Simulates a kernel that never settles the integrity value for which the tool waits.
+// The tool waits forever if the kernel never settles the tool's integrity value. Here, `sleep`
+// replaces the waiting tool.
 TEST_F(Phone, EndsARunThatTakesTooLong) {
   InstallProgram("apktoolkit", "exec sleep 60 #");
   RunLimits limits;

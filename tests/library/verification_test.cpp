@@ -55,7 +55,7 @@ Package Without(const std::string& name) {
   return package;
 }
 
-// A good package whose entry `name` was changed, so that it cannot be extracted.
+// A good package in which the entry `name` was changed and cannot be extracted.
 Package WithUnreadable(const std::string& name) {
   Package package = MakePackage();
   ZipItem& item = package.Item(name);

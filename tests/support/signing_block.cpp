@@ -32,7 +32,7 @@ struct ArchiveParts {
   Bytes entries, directory, end_record;
 };
 
-constexpr size_t kEndRecordSize = 22;            // of the end of the central directory
+constexpr size_t kEndRecordSize = 22;            // of the end of central directory record
 constexpr size_t kDirectoryOffsetInRecord = 16;  // where that record has the directory's offset
 constexpr size_t kCommentInRecord = 20;          // where that record has the comment's length
 

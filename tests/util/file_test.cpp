@@ -1,5 +1,5 @@
-// ReadFile, OpenForReading, IsSameFile and StringToVector. The tests use real files. They also
-// simulate results that the kernel rarely returns for real files.
+// ReadFile, OpenForReading, IsSameFile and StringToVector. Most tests use real files. Some simulate
+// results that the kernel rarely returns for real files.
 #include "util/file.h"
 
 #include <fcntl.h>
@@ -383,7 +383,8 @@ TEST(IsSameFile, EachPartOfTheStateCounts) {
   }
 }
 
-// Each state is compared with itself, but is not the state of a regular file.
+// Each state is compared with itself. IsSameFile returns false, because neither state is the state
+// of a regular file.
 TEST(IsSameFile, FilesThatAreNotRegularAreNotTheSame) {
   struct stat state = {};
   EXPECT_FALSE(IsSameFile(state, state));

@@ -1,6 +1,6 @@
-// Tests that TakeApart assigns each answer of the kernel to a library or to the file itself. While
-// the tool signs libraries or the file, the tool's step decides. At other times, the path in the
-// event decides.
+// Tests how TakeApart decides whether an answer of the kernel is about the file itself or about
+// another file. While the tool signs libraries or the file, the tool's present step decides. At
+// other times, the path in the event decides.
 #include "simulator/run/run_record.h"
 
 #include <gtest/gtest.h>
