@@ -241,6 +241,11 @@ void JudgeShown(const Report& report) {
           "the event has the status");
   Require(event["items"].size() == report.items.size(),
           "the event has as many items as the report");
+  for (size_t i = 0; i < report.items.size(); ++i) {
+    const Cause* const cause = report.items[i].reason.cause;
+    Require(event["items"][i].value("reason", "") == (cause == nullptr ? "" : cause->code),
+            "each item of the event has its reason");
+  }
 }
 
 }  // namespace
