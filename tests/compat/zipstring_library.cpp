@@ -1,3 +1,5 @@
+// Implements the older interface of the zip library, with ZipString, by calls of the installed
+// library.
 #include <ziparchive/zip_archive.h>
 
 #include <cstdlib>
