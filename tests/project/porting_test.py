@@ -81,7 +81,8 @@ def with_library_directories():
         installed.setdefault(directory, []).append(entry)
     rows = "".join(f"| {', '.join(f'`{entry}/`' for entry in entries)} | `{directory}/` |\n"
                    for directory, entries in installed.items())
-    items = "".join(f".It Pa {directory}\nBeside a package: its extracted libraries, those of\n"
+    items = "".join(f".It Pa {directory}\nBeside a package: the libraries that were extracted from the "
+                    "package's\n"
                     + "\nand\n".join(f".Pa {entry}" for entry in entries) + " .\n"
                     for directory, entries in installed.items())
     head = "| Entries of the package | Files beside the package |\n|---|---|\n"
