@@ -16,8 +16,8 @@ struct PublicKey {
   std::string algorithm;  // "RSA", "EC" or "DSA"; else the name that AlgorithmOf() returns
   int bits = 0;           // 0: not known
   std::string sha256;     // of the SubjectPublicKeyInfo; digests are in lower-case hexadecimal
-  // The SHA-256 digest of an RSA modulus without leading zeros. Empty if the key is not an RSA key,
-  // or if the library cannot read the key.
+  // The SHA-256 digest of an RSA key's modulus. The digested bytes do not begin with a zero byte.
+  // Empty if the key is not an RSA key, or if the library cannot read the key.
   std::string modulus_sha256;
 };
 
@@ -28,7 +28,7 @@ struct CertificateFacts {
   std::string issuer;
   bool is_self_issued = false;  // issuer and subject are the same name
   std::string sha256;           // of the whole certificate
-  std::string sha1;             // of the whole certificate; some stores identify signers by it
+  std::string sha1;             // of the whole certificate; some app stores identify signers by it
   // The algorithm of the certificate's own signature, such as "SHA384withRSA".
   std::string signature_algorithm;
   bool has_known_digest = false;  // signed with RSA PKCS#1 v1.5 over MD5, SHA-1 or SHA-256

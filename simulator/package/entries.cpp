@@ -67,8 +67,8 @@ EntryDigest Compare(Archive* archive, const EntryDigests& manifest, const Archiv
   return IsKnownDigest(digest_name, tool) ? EntryDigest::kDiffers : EntryDigest::kNotCompared;
 }
 
-// True if `name` is the name of a SHA-1 digest for the tool. Asks the tool whether the SHA-1 digest
-// of an empty text is right under this name.
+// True if the tool treats `name` as the name of a SHA-1 digest. Asks the tool whether the SHA-1
+// digest of an empty text is right under this name.
 bool IsSha1Digest(const std::string& name, Apk* tool) {
   std::vector<uint8_t> sha1;
   ComputeSHA1Digest({}, sha1);

@@ -40,8 +40,8 @@ struct LibraryFacts {
   // The path at which the tool looks for the extracted file, relative to the package's directory.
   // Empty if no prefix in kLibraryDirectories (apk/native_libraries.h) matches `entry`.
   std::string place;
-  // True if the tool reaches `entry`. The tool stops at the first damaged entry: `is_met` is false
-  // for this entry and for all later entries.
+  // True if the tool reaches `entry`. The tool stops at the first library whose entry is damaged:
+  // `is_met` is false for this library and for all later libraries.
   bool is_met = true;
   int error = 0;               // errno of opening the file; 0: success, or `place` is empty
   bool has_directory = false;  // the file's directory exists
@@ -60,7 +60,9 @@ struct PackageFacts {
   // `entry_twice` are filled.
   int32_t archive_result = -1;
 
-  std::string entry_twice;  // the first name that a refused archive has twice; empty: none
+  // The first name that the archive has twice. Empty if the archive has no name twice, or if the
+  // zip library opened the archive.
+  std::string entry_twice;
 
   AndroidManifest manifest;
   JarSignatureFacts jar;

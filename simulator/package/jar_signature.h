@@ -1,7 +1,8 @@
 // The JAR signature that the tool verifies, and facts that explain the tool's answer. The tool's
-// own code finds the signature file and its block, and reads the signature file and the key. Parts
-// that only explain the answer are read as strict DER (signature_block.h) or by libcrypto
-// (certificate.h). Only the tool decides whether the signature is valid.
+// own code finds the signature file and its block, and reads the signature file and the key. Other
+// facts only explain the answer: facts of the block, which is read as strict DER
+// (signature_block.h), and facts of the certificate, which libcrypto reads (certificate.h). Only
+// the tool decides whether the signature is valid.
 #pragma once
 
 #include <cstddef>
@@ -18,7 +19,7 @@ namespace simulator {
 // An RSA key as the tool reads it from a signature block. Other readers of the certificate may find
 // another key.
 struct ToolKey {
-  std::string modulus_sha256;  // the digest in the payload; in hexadecimal
+  std::string modulus_sha256;  // the digest in the kernel's payload; in hexadecimal
   uint32_t size = 0;           // of the modulus in bytes, as the tool reads it
   int bits = 0;
   int32_t exponent = 0;

@@ -6,9 +6,9 @@
 
 namespace simulator {
 
-// The length, in bytes, of the UTF-8 string `index` of `pool`, an android::ResStringPool; 0 if it
-// cannot be read. The first overload is for the older generation, whose string8At() has a parameter
-// for the length.
+// Returns the length, in bytes, of the UTF-8 string with the number `index` in `pool`. Returns 0 if
+// this string cannot be read. `Pool` is android::ResStringPool. The first overload is for the older
+// generation, whose string8At() has a parameter for the length.
 template <typename Pool>
 auto StringLength(const Pool& pool, size_t index)
     -> decltype(pool.string8At(index, static_cast<size_t*>(nullptr)), size_t()) {

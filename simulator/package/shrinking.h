@@ -1,5 +1,5 @@
 // Protects the process from a mapped file that becomes shorter while it is read. The pages beyond
-// the new end have no bytes, and reading them ends the process with SIGBUS.
+// the new end have no bytes. Without this protection, reading them ends the process with SIGBUS.
 #pragma once
 
 namespace simulator {

@@ -57,8 +57,8 @@ bool ReadSigners(CBS signers, SignatureBlockFacts* facts) {
   return facts->signer_count > 0;
 }
 
-// The fields of a SignerInfo: version, signer identifier, digest algorithm, signed attributes
-// (optional), signature algorithm, signature.
+// A SignerInfo begins with these fields: version, signer identifier, digest algorithm, signed
+// attributes (optional), signature algorithm, signature.
 bool ReadSigner(CBS signer, SignatureBlockFacts* facts) {
   CBS skipped, identifier, digest, algorithm;
   int has_attributes = 0;

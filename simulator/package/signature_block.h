@@ -1,7 +1,7 @@
-// Reads the signature block of a JAR, a PKCS#7 SignedData (RFC 2315 §9), as strict DER. The tool's
-// own reader is not strict. This reader shows two things that the tool does not report: the
-// contents of a block that the tool refused, and what a strict reader finds in a block that the
-// tool accepted.
+// Reads the signature block of a JAR as strict DER. The block is a PKCS#7 SignedData (RFC 2315 §9).
+// The tool's own reader is not strict. This reader shows two things that the tool does not report:
+// the contents of a block that the tool refused, and the contents that a strict reader finds in a
+// block that the tool accepted.
 #pragma once
 
 #include <cstddef>

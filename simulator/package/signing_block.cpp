@@ -13,10 +13,10 @@ constexpr size_t kSizeField = 8;
 constexpr size_t kFooter = kSizeField + kMagic.size();
 
 // The highest number of signers, of all schemes together. A block with more signers counts as
-// damaged here. A phone accepts at most ten v2 signers, and uses only one signer of v3 or v3.1.
+// damaged here. A phone accepts at most ten v2 signers. Of all v3 and v3.1 signers, it uses one.
 constexpr size_t kMostSigners = 16;
 
-// The known schemes. `id` identifies the scheme's pair in the block.
+// The known schemes. `id` is the ID of the scheme's ID-value pair in the block.
 constexpr struct {
   uint32_t id;
   const char* name;
@@ -29,9 +29,9 @@ bool TakePrefixed(CBS* bytes, CBS* part);
 
 }  // namespace
 
-// A block consists of its size, pairs of an ID and a value, the size again, and the magic. Each
-// size counts all bytes after the first size field. If the two sizes differ, the platform finds no
-// block.
+// A block consists of its size, ID-value pairs, the size again, and the magic. The block's size is
+// the number of all bytes after the first size field. If the two size fields differ, the platform
+// finds no block.
 std::string ReadSigningBlock(int fd, const ArchiveEnd& end, bool* is_too_large) {
   *is_too_large = false;
   if (end.directory_offset < kSizeField + kFooter) return {};

@@ -24,8 +24,8 @@ struct SigningBlock {
   // In the order of the block. If the block has several ID-value pairs for one scheme, the first
   // pair counts.
   std::vector<NewerSigner> signers;
-  // A part of the block is malformed, or is one signer too many. `signers` has only the signers
-  // before this part.
+  // A part of the block is malformed, or the block has too many signers. `signers` then has only
+  // the signers before the malformed part, or before the first signer that is too many.
   bool is_damaged = false;
 };
 

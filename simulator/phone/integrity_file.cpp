@@ -1,7 +1,8 @@
-// The files in which the kernel publishes each task's integrity value: /proc/self/integrity/value
-// and /proc/PID/integrity/value, for callers that open them with fopen or fopen64. The files are
-// read-only. The phone's settings list integrity values. Each opening for reading, of any existing
-// task's file, delivers the next value of this list. The last value repeats.
+// Simulates the files in which the kernel publishes each task's integrity value:
+// /proc/self/integrity/value and /proc/PID/integrity/value. The simulated files are read-only, and
+// exist only for callers of fopen and fopen64. The phone's settings list integrity values. Each
+// opening for reading, of any existing task's file, delivers the next value of this list. The last
+// value repeats.
 #include <fcntl.h>
 #include <sys/mman.h>
 #include <unistd.h>

@@ -43,8 +43,8 @@ void Trust(int fd);
 bool IsTrusted(int fd);
 int Answer(Event* event, int error, int errno_before);
 
-// Records in the journal that this library is loaded. Removes LD_PRELOAD from the environment, so
-// that programs that the tool starts do not load this library.
+// Runs when this library is loaded, and records the event "attached" in the journal. Removes
+// LD_PRELOAD from the environment, so that programs that the tool starts do not load this library.
 __attribute__((constructor)) void Attach() {
   const ErrnoKeeper keeper;
   Record(Event("attached").Number("pid", getpid()));
@@ -114,8 +114,8 @@ int CopyPayload(const void* argument, std::string* payload) {
 }
 
 // Copies `size` bytes from `from` to `to`. Returns false if the memory at `from` cannot be read.
-// Unreadable memory causes no signal, as in the kernel. The bytes go through a file, because pwrite
-// reports unreadable memory as an error, also under an emulator.
+// As in the kernel, unreadable memory causes no signal. The bytes go through a file, because pwrite
+// reports unreadable memory as an error, with or without an emulator.
 bool CopyIn(const char* from, size_t size, char* to) {
   const ssize_t wanted = static_cast<ssize_t>(size);
   return pwrite(Scratch(), from, size, 0) == wanted && pread(Scratch(), to, size, 0) == wanted;

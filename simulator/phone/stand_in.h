@@ -1,8 +1,8 @@
-// Shared by the two stand-ins. A stand-in is a library that replaces a part of the phone inside the
-// tool's process: one replaces the kernel and the log, the other replaces libzu. This file has the
-// phone's settings, the journal, and a class that keeps errno unchanged for the tool. Each stand-in
-// has its own copy of this code. The settings are never destroyed, because the tool's last output
-// is recorded after the destructors have run.
+// The code that the two stand-ins share. A stand-in is a library that replaces a part of the phone
+// inside the tool's process: one replaces the kernel and the log, the other replaces libzu. This
+// file has the phone's settings, the journal, and a class that keeps errno unchanged for the tool.
+// Each stand-in has its own copy of this code. The settings are never destroyed, because the tool's
+// last output is recorded after the destructors of static objects have run.
 #pragma once
 
 #include <cerrno>

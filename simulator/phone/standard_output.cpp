@@ -1,6 +1,7 @@
 // Records the tool's standard output as events. `stdout` becomes a line-buffered stream. This
 // stream first records each line in the journal, and then writes the line to descriptor 1. Without
-// line buffering, the journal could have a line after events that happened later.
+// line buffering, an event that happened after a line was printed could precede this line in the
+// journal.
 #include <unistd.h>
 
 #include <cstdio>
@@ -27,8 +28,8 @@ __attribute__((constructor)) void ReplaceStandardOutput() {
   stdout = stream;
 }
 
-// The C library flushes `stdout` only after all destructors. If a later destructor ended the
-// process, the last output would be lost.
+// The C library flushes `stdout` only after all destructors. Without this earlier flush, the last
+// output would be lost if a destructor that runs after this one ended the process.
 __attribute__((destructor)) void FlushStandardOutput() { fflush(stdout); }
 
 }  // namespace

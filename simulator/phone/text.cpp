@@ -61,7 +61,8 @@ std::string HexText(std::string_view bytes) {
   return text;
 }
 
-// Valid characters (RFC 3629 §4) have no overlong form, are not surrogates, and end at U+10FFFF.
+// A valid character (RFC 3629 §4) is not in an overlong form, is not a surrogate, and is not above
+// U+10FFFF.
 size_t Utf8Length(std::string_view bytes) {
   constexpr uint32_t kLeast[] = {0, 0, 0x80, 0x800, 0x10000};
   if (bytes.empty()) return 0;
