@@ -30,17 +30,17 @@ struct ListedFile {
 
 struct FileList {
   std::vector<ListedFile> files;
-  size_t others = 0;  // how many files below directories were skipped for their names
+  size_t others = 0;  // how many files below directories were skipped: they have no package names
 };
 
-// Lists the names of the command line, then the names of the list, without sorting them. With
-// `is_recursive`, a directory is replaced by the files below it that have package names
-// (IsPackageName), sorted by their paths, byte by byte. A symbolic link to a directory is then
-// followed if the link was named, but is skipped if it was found below a directory. Empty names in
-// a list are skipped.
+// Fills `list` with the names from `options.names` and then the names in the file `options.list`,
+// without sorting them. With `is_recursive`, a directory is replaced by the files below it that
+// have package names (IsPackageName), sorted by their paths, byte by byte. A symbolic link to a
+// directory is then followed if the link was named, but is skipped if it was found below a
+// directory. Empty names in `options.list` are skipped.
 //
-// Returns none on success, else the reason of the failure: the list cannot be read, has no names,
-// or has NUL bytes although its names end with line feeds.
+// Returns none on success, else the reason of the failure: `options.list` cannot be read, has no
+// names, or has NUL bytes although `has_nul` is false.
 std::optional<std::string> ListFiles(const FileListOptions& options, FileList* list);
 
 }  // namespace simulator

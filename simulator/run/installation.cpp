@@ -31,7 +31,7 @@ namespace fs = std::filesystem;
 constexpr const char* kPhoneAbis[] = {"arm64-v8a", "armeabi-v7a", "armeabi"};
 constexpr char kArm64Directory[] = "lib/arm64";
 
-// Paths below the package's directory, each with the entry that is extracted to it.
+// Maps a path, relative to the package's directory, to the entry that is extracted to this path.
 using Layout = std::map<std::string, std::string>;
 
 std::vector<std::string> LibraryNames(const Archive& archive);
@@ -152,8 +152,8 @@ bool LiesAlone(int package, const std::vector<std::string>& libraries) {
 }
 
 // `choice` selects the processors (InstalledAbi): 64-bit Arm, 32-bit Arm or both. For each selected
-// processor, an installer uses only one ABI: the first in kPhoneAbis for which the package has
-// libraries.
+// processor, an installer uses only one of the processor's ABIs. It is the first of these ABIs in
+// kPhoneAbis for which the package has libraries.
 Layout PlanLayout(const std::vector<std::string>& entries, InstalledAbi choice,
                   std::vector<std::string>* left_out, std::set<std::string>* of_other_abis) {
   Layout layout;
@@ -214,8 +214,8 @@ bool PutPackage(const std::string& file, int source, const std::string& copy,
   return size == 0;
 }
 
-// Returns 0 if the entry was extracted. If the file cannot be created or written, returns the
-// errno. If the entry cannot be extracted, returns -1.
+// Returns 0 if the whole entry was extracted to `path`. If the file at `path` cannot be created or
+// written, returns the errno. If the entry cannot be read to its end, returns -1.
 int Extract(const Archive& archive, const std::string& entry, const std::string& path,
             const Deadline& deadline) {
   constexpr mode_t kMode = 0755;

@@ -1,5 +1,5 @@
-// A package laid out in the same way as by an installer: in a temporary directory, with its native
-// libraries beside it. The destructor removes the directory.
+// A temporary directory that holds a package with its native libraries beside it, as after an
+// installation on a phone. The destructor removes the directory.
 #pragma once
 
 #include <optional>
@@ -23,13 +23,13 @@ enum class InstalledAbi {
 enum class InstallWhen {
   kAlone,   // packages that have neither their libraries nor an installer's library directories
             // beside them; no package on a read-only file system
-  kAlways,  // all packages with libraries
+  kAlways,  // all packages whose libraries an installer extracts
   kNever,
 };
 
 // The output shows this text instead of the installation's temporary directory, because the name of
-// that directory differs in each run. In a journal, no other path begins with this text, because
-// the kernel's paths begin with "/".
+// that directory differs in each run. In a journal, this text cannot be mistaken for the start of a
+// path from the kernel, because such a path begins with "/".
 inline constexpr char kInstalledDirectory[] = "<install>/";
 
 class Installation {

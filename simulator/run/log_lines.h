@@ -23,8 +23,10 @@ enum class LogMeaning {
   kPackageTakenUp,
   kJarTakenUp,
   kNotSigned,
-  // Reasons why a file is not a package, or not a good one. The captured parts are the zip
-  // library's code or reason, the block's name, and the codes of crypto/rsa.h.
+  // Reasons why a file is not a package, or is a package that the tool refuses. The captured parts
+  // are the zip library's code (kNoArchive), the zip library's reason (kNoAndroidManifest), the
+  // name of the PKCS#7 block (kNoBlock), and the codes of crypto/rsa.h (kKeyRefused,
+  // kCertificateRefused, kSignatureRefused).
   kNoArchive,
   kNoAndroidManifest,
   kNoBlock,
@@ -39,8 +41,8 @@ enum class LogMeaning {
   kAndroidManifestMalformed,
   kNoGoodPackage,
   kNoArchiveToSign,
-  // Reasons why a library or the dex file is not good. The captured parts are the library's path
-  // and, in kErrorNumber, errno.
+  // Reasons why the tool refuses a library or the dex file. The captured parts are the library's
+  // path (kLibraryRefused, kLibraryVanished) and the errno (kErrorNumber).
   kFileNotOpened,
   kFileNotRead,
   kNotListed,

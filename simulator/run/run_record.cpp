@@ -12,7 +12,7 @@ namespace {
 
 using nlohmann::json;
 
-// Reads the events one after the other, and keeps the present step of the tool.
+// Reads the events one after the other, and remembers which step the tool has reached.
 class Reader {
  public:
   void Read(const json& event);

@@ -30,7 +30,7 @@ struct Attempt {
   Outcome outcome = Outcome::kBegun;
   int64_t error = 0;                      // the errno of the kernel's refusal or of the failed open
   std::string payload;                    // the bytes that the kernel got, in hexadecimal
-  std::optional<std::string> integrity;   // last read integrity value; none: not read, or no file
+  std::optional<std::string> integrity;   // last value read; none: not read, or no integrity file
   LogMeaning why = LogMeaning::kUnknown;  // the first error about a refused library, if any
 };
 

@@ -1,5 +1,5 @@
-// The bytes that the phone's kernel has signed so far. A file with these bytes is trusted, under
-// any name.
+// The bytes of each file that the phone's kernel has signed so far. A file with the same bytes as a
+// signed file is trusted, under any name.
 //
 // With a directory (--state), SHA-256 digests are remembered across runs. Each digest is the name
 // of a file in the directory. That file contains the path of the signed file, for human readers.
@@ -31,7 +31,8 @@ class SignedBytes {
 
   // True if the file at `path` has bytes that were signed. False for a file that is not regular.
   // Also false if the file must be digested, but cannot be read before the deadline. Without a
-  // directory, also false if the signed file changed before this object digested that file.
+  // directory, can also be false for the bytes of a signed file if the state of that file
+  // (IsSameFile in util/file.h) changed before this object digested the bytes.
   bool Holds(const std::string& path, const Deadline& deadline);
 
   // Remembers the present bytes of the file at `path`. With a directory, returns false if the
@@ -40,8 +41,8 @@ class SignedBytes {
   bool Add(const std::string& path, const Deadline& deadline);
 
  private:
-  // A signed file, and its state when it was signed. The file is digested later, if needed, and
-  // only if its state is still the same.
+  // A signed file, and its state when it was added. The file is digested only when a lookup needs
+  // the digest, and only if the file's state is then still the same.
   struct Seen {
     std::string path;
     struct stat state;

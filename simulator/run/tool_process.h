@@ -24,10 +24,10 @@ struct ToolEnd {
   int value;  // kExited: the status. kKilled: the signal. kNotStarted: the errno. Otherwise 0.
 };
 
-// Runs the command to its end. If the command still runs after the deadline, RunTool kills the
-// command; the result is then kStopped. RunTool discards the command's standard output, because the
-// library `kernel` records the tool's output in the journal. The command's standard input and
-// standard error are those of this process.
+// Runs the command to its end. If the command still runs when deadline.HasPassed() becomes true,
+// RunTool kills the command; the result is then kStopped. RunTool discards the command's standard
+// output, because the library `kernel` records the tool's output in the journal. The command's
+// standard input and standard error are those of this process.
 ToolEnd RunTool(const ToolCommand& command, const Deadline& deadline);
 
 // The program that RunTool starts: the first word of the runner, or the tool if there is no runner.

@@ -15,8 +15,9 @@ using kainjow::mustache::data;
 using kainjow::mustache::list;
 using kainjow::mustache::object;
 
-// A row of the table: the judgement of the tool or of the phones of some API levels, or why there
-// is no judgement of phones. Each text of `signers` and `why` becomes a line of its cell.
+// A row of the table. It shows the tool's judgement, or the judgement of phones with certain API
+// levels, or that there is no judgement of phones. Each text of `signers` and `why` becomes a line
+// of its cell.
 struct Said {
   std::string who;
   Mark mark;

@@ -8,8 +8,8 @@
 
 namespace simulator {
 
-// Sets the template's sections that make the table. The table is empty for a file that is not a
-// package.
+// Sets the template's sections that make the table. The page has no table for the file if
+// `report.chain` is empty and the installer's verifier was not asked about the file.
 void AddJudgements(const Report& report, kainjow::mustache::data* file);
 
 }  // namespace simulator
