@@ -53,7 +53,7 @@ bool IsJarSigner(const PublicKey& key, const Report& report) {
 
 namespace {
 
-// Warns if other programs can find a signer or package name that differs from the tool's.
+// Warns if other programs can find another signer, or another package name, than the tool finds.
 void WarnOfTwoFaces(const PackageFacts& facts, const Report& report, Reasons* warnings) {
   const JarSignatureFacts& jar = facts.jar;
   if (report.key && jar.certificate) {
@@ -148,7 +148,8 @@ std::vector<const CertificateFacts*> Certificates(const PackageFacts& facts) {
   return certificates;
 }
 
-// One warning for each newer scheme with a signer whose key is not the JAR signer's key.
+// One warning for each newer scheme (v2 or later) that has a signer whose key is not the JAR
+// signer's key.
 void WarnOfOtherKeys(const PackageFacts& facts, const Report& report, Reasons* warnings) {
   if (!report.key && !report.signer) return;
   for (const std::string& scheme : NewerSchemes(facts)) {

@@ -36,8 +36,8 @@ std::string LevelText(const LevelRange& levels);
 // Empty if some of these phones do not install the package, or if apksig gave no judgement.
 std::string TakersText(const Judgement& judgement);
 
-// The algorithm and, if known, the size in bits of the JAR signer's key, such as "RSA-2048". Both
-// come from report.key, or from report.signer if report.key is not set. Empty if neither
+// The JAR signer's key as text: its algorithm and, if known, its size in bits, such as "RSA-2048".
+// Both come from report.key, or from report.signer if report.key is not set. Empty if neither
 // report.key nor report.signer is set.
 inline std::string KeyName(const Report& report) {
   const PublicKey shown = report.signer ? report.signer->key : PublicKey();

@@ -45,8 +45,8 @@ Facts Read(const CompiledXml& xml) {
   return {apk.GetPackageName(), apk.IsSsPermissionRequired()};
 }
 
-// Puts the element into an element "manifest". Returns true if this document asks for the
-// secure-storage permission.
+// Builds a document with the element inside an element "manifest". Returns true if the document
+// asks for the secure-storage permission.
 bool Asks(const std::string& element, const std::vector<XmlAttribute>& attributes) {
   CompiledXml xml;
   xml.Start("manifest", {Package("p")}).Element(element, attributes).End("manifest");
@@ -391,8 +391,9 @@ Bytes Replaced(Bytes document, const Bytes& old_bytes, const Bytes& new_bytes) {
   return document;
 }
 
-// The changed document claims a length of 9 for the name "manifest", and no NUL follows the ninth
-// byte. The platform's library then returns the name's length but no text.
+// The changed document claims a length of 9 for the name "manifest". The NUL at the end of the name
+// is then the ninth byte, and no NUL follows it. The platform's library then returns the name's
+// length but no text.
 TEST(AndroidManifestDocument, ElementWhoseNameDoesNotEndIsSkipped) {
   CompiledXml xml;
   xml.Element("manifest", {Package("a")}).Element("permission", {AndroidName(kPermission)});

@@ -223,9 +223,9 @@ TEST(EntryDigests, EarlierManifestDoesNotAffectTheNext) {
   }
 }
 
-// The third section of `whole` is still in memory after the second Load: after the end of the new
-// text, and in the memory that the table of ManifestSections used before. This section must not be
-// listed.
+// After the second Load, the third section of `whole` is still in memory at two places: beyond the
+// end of the new text, and in the memory that the table of ManifestSections keeps. This section
+// must not be listed.
 TEST(EntryDigests, SectionAfterTheEndOfTheTextIsNotListed) {
   const std::string two = Section("a", "1") + Section("b", "2");
   const std::string whole = two + Section("c", "3");

@@ -43,8 +43,8 @@ TEST(Extraction, EmptyEntryIsExtracted) {
   }
 }
 
-// Deflate encodes at most 258 bytes in two bits, so its limit is 1032 bytes in one byte. Zeros come
-// close to this limit.
+// Deflate encodes at most 258 bytes in two bits, so a byte of compressed data stands for at most
+// 1032 bytes. Zeros come close to this limit.
 TEST(Extraction, EntryThatDeflatesBestIsExtracted) {
   const Bytes zeros(10 << 20, 0);
   OpenEntry zip({"a", zeros, true});
@@ -85,7 +85,7 @@ TEST(Extraction, StoredEntryMustBeAsLongAsItsData) {
   EXPECT_TRUE(IsPlausibleLength(entry));
 }
 
-// Large enough that kLongLength - 1, which a test declares, is also above kZipTrustedLength.
+// One test declares the length kLongLength - 1. This length must be above kZipTrustedLength, too.
 constexpr uint32_t kLongLength = kZipTrustedLength + 2;
 // An entry of kLongLength zeros. It is made once, because the compression takes time.
 const ZipItem& LongItem() {
@@ -113,7 +113,7 @@ TEST(Extraction, LongEntryWithAFalseLengthLeavesTheVectorUnchanged) {
   }
 }
 
-// The zip library's code for data that does not inflate.
+// The zip library's result if the data of an entry cannot be inflated.
 constexpr int32_t kZlibError = -2;
 
 TEST(Extraction, EntryThatCannotBeInflatedFailsWithZlibError) {

@@ -87,8 +87,8 @@ TEST_F(JarManifestCalls, NamesInOrderNeedFewerThan4ComparisonsEach) {
   EXPECT_LT(count, 4 * 4096u);
 }
 
-// Each sort drops the repeated names. The next sort waits until the text has advanced by more than
-// the total length of the names that are left.
+// Each sort drops the repeated names. add() sorts again only after more bytes of text than the
+// remaining names have together.
 TEST_F(JarManifestCalls, RepeatedNamesNeedFewerThan48ComparisonsEach) {
   std::vector<std::string> names;
   for (int round = 0; round < 64; ++round) {
@@ -145,7 +145,8 @@ TEST_F(JarManifestCalls, NamesInOrderAreNotHashed) {
   EXPECT_GT(in_order, 12u);
 }
 
-// ---- Continuation lines. The parser moves each of them to the end of a value that is not empty.
+// ---- Continuation lines. If a value is not empty, the parser moves the next continuation line to
+// the end of the value.
 
 TEST_F(JarManifestCalls, LinesThatOverlapTheirNewPlaceAreMovedWhole) {
   std::string value;

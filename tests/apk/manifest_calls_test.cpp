@@ -1,6 +1,7 @@
-// Counts calls of the platform's library. A hostile document can make each call expensive, and the
-// results do not show the number of calls. The linker redirects the tool's calls to the functions
-// below, which count them and call the library. CMakeLists.txt has the mangled names.
+// Counts the tool's calls of two functions of the platform's library. A hostile document can make
+// each call expensive, and the tool's results do not show the number of calls. The linker redirects
+// these calls to the functions below, which count them and call the library. CMakeLists.txt has the
+// mangled names.
 #include <androidfw/ResourceTypes.h>
 #include <gtest/gtest.h>
 #include <utils/String8.h>

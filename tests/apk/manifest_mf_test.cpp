@@ -243,8 +243,8 @@ TEST(ManifestMf, NameThatRunsIntoTheEndOfTheTextFails) {
   ExpectNoColon("A: 1\r\nNoColonHere\r\n", "NoColonHere\r\n");
 }
 
-// The message contains the whole name, or as much of it as fits in a log record: 1024 bytes with a
-// NUL at the end. Without the name, the message takes 66 bytes.
+// A log record has room for 1023 bytes of text and a NUL. A longer message is cut after 1023 bytes.
+// Without the name, the message takes 66 bytes.
 TEST(ManifestMf, NameThatRunsIntoTheEndIsReportedInAtMost1023Bytes) {
   const std::string before = "Parse manifest: Error: P_KEY: unexpected end of file after key '";
   std::string name;
@@ -321,7 +321,7 @@ TEST(ManifestMf, ContinuationAfterAColonAndALoneLineFeedIsAName) {
   EXPECT_EQ(Sections({{{"value\nName", "x"}}}), Parse("A:\n value\nName: x\n\n"));
 }
 
-// "N", the first byte of the next line, and the LF after "N" are together one line break.
+// The next line begins with "N". This "N" and the LF after it count together as one line break.
 TEST(ManifestMf, OneByteLineAfterAColonAndALoneLineFeedIsLostWithItsLineBreak) {
   EXPECT_EQ(Sections({{{"Name", "x"}}}), Parse("A:\nN\nName: x\n\n"));
 }

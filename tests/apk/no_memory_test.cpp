@@ -1,4 +1,4 @@
-// Tests the verification of a package if allocations fail.
+// Tests that the verification of a package fails if an allocation fails.
 #include <gtest/gtest.h>
 
 #include "support/failing_malloc.h"
@@ -21,8 +21,8 @@ TEST(VerifyCertificate, FailedAllocationForTheKeyIsReportedWithCode9) {
 }
 
 // The second allocation is for the key's exponent. The next allocations belong to the verification
-// of the certificate. The last allocations belong to the verification of the signature file, which
-// the log calls "data". If an allocation fails, the verification that needs the memory fails.
+// of the certificate. The last allocations belong to the verification of the signature file. The
+// log calls this file "data". If an allocation fails, the verification that needs the memory fails.
 TEST(VerifyCertificate, FailedAllocationInTheVerificationIsReported) {
   const Bytes archive = MakePackage().Build();
   int certificates = 0, signatures = 0;

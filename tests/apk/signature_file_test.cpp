@@ -270,7 +270,7 @@ TEST(ValidateManifest, MissingSignatureFileIsReported) {
   EXPECT_EQ(log.records(), Records({Error("Can't validate manifest. Bad SF file.\n")}));
 }
 
-// ---- Digests by the names of their attributes.
+// ---- The name of the attribute selects the digest algorithm.
 
 class VerifyData : public testing::Test {
  protected:

@@ -24,7 +24,7 @@ int Read(const Bytes& bytes, asn1_hdr* hdr) {
   return asn1_get_next(bytes.data(), bytes.size(), hdr);
 }
 
-// A header with 0xee in every byte. It shows which fields a call sets.
+// A header with 0xee in every byte. A field that a call does not set keeps these bytes.
 asn1_hdr Used() {
   asn1_hdr hdr;
   memset(&hdr, 0xee, sizeof(hdr));

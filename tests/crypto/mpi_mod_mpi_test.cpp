@@ -11,7 +11,8 @@ namespace {
 constexpr int kRounds = 150000;
 
 // About half of the dividends are random. Each other dividend is a multiple of the divisor, or 1 to
-// 3 less than a multiple. Near multiples, the estimate of a quotient digit is most often wrong.
+// 3 less than a multiple. Near multiples, the estimate of a quotient digit is wrong more often than
+// elsewhere.
 TEST(MpiModMpi, IsTheNonNegativeRemainder) {
   Operands operands;
   for (int round = 0; round < kRounds; ++round) {
@@ -100,10 +101,10 @@ TEST(MpiModMpi, IsRightFor2To8192AndAModulusOf128Limbs) {
 
 // The numbers are hexadecimal. d, the top limb of the divisor, is 8000ffff. half_digit
 // (crypto/mpi.cpp) first divides the top limb of A by the upper half of d: 48000000 / 8000 is 9000,
-// with remainder 0. It then adds d to the remainder until the sum wraps or is at least 9000 * ffff.
-// The first sum is d itself. This sum did not wrap and is less than 9000 * ffff, so d must be added
-// again. If half_digit stopped after the first addition, its result would be far too large.
-// quotient_digit would then reduce the digit in steps of 1, which is slow.
+// with remainder 0. half_digit then adds d to the remainder until the sum wraps or is at least
+// 9000 * ffff. The first sum is d itself. This sum did not wrap and is less than 9000 * ffff, so d
+// must be added again. If half_digit stopped after the first addition, the result of estimate_digit
+// would be far too large. quotient_digit would then reduce the digit in steps of 1, which is slow.
 TEST(MpiModMpi, IsFastIfTheFirstSumEqualsTheDivisorsTopLimb) {
   const Number A({0x12345678, 0x0000abcd, 0x48000000});
   const Number B({0xfedcba98, 0x8000ffff});

@@ -63,6 +63,6 @@ int32_t ProcessZipEntryContents(ZipArchiveHandle archive, ZipEntry* entry,
 
 int GetFileDescriptor(ZipArchiveHandle archive);
 
-// Equal in both interfaces: the installed library's own functions.
+// These two functions are equal in both interfaces. The installed library itself defines them.
 void EndIteration(void* cookie);
 const char* ErrorCodeString(int32_t error_code);
