@@ -29,8 +29,8 @@ const Bytes& Sha256Algorithm() {
   return algorithm;
 }
 
-// A block that ends with the [0] of the certificates, followed by `signers`. The enclosing elements
-// have the indefinite form (see BlockEndingIn).
+// A block whose last parts are the [0] of the certificates and then `signers`. The enclosing
+// elements have the indefinite form (see BlockEndingIn).
 Bytes BlockEndingInSigners(const Bytes& signers) {
   return BlockEndingIn(
       Concat({der::Context(0, *WithRsaKey(Bytes(64, 0x77), {3}).certificates), signers}));
@@ -164,8 +164,8 @@ TEST(ProcessCertSigner, AnyDigestAlgorithmAndParametersAreAccepted) {
 }
 
 TEST(ProcessCertSigner, MissingEncryptedDigestIsReportedAsUnreadable) {
-  // No digestEncryptionAlgorithm, half of its header, no encryptedDigest, half of its header, and
-  // half of a long-form tag.
+  // In the first two cases, the digestEncryptionAlgorithm is missing or is half of a header. In the
+  // others, the encryptedDigest is missing, is half of a header, or is half of a long-form tag.
   const Bytes algorithm = AlgorithmIdentifier("1.2.3");
   for (const Bytes& rest : {Bytes(), Bytes{0x30}, algorithm, Concat({algorithm, {0x04}}),
                             Concat({algorithm, {0x1f}})}) {
@@ -199,7 +199,7 @@ TEST(ProcessCertSigner, EncryptedDigestIsBoundedByTheOffsetAfterDigestAlgorithm)
 TEST(ProcessCertSigner, DigestEncryptionIsBoundedByTheOffsetAfterDigestAlgorithm) {
   const Bytes up_to_algorithm =
       BlockEndingInSigners(Concat({FromHex("31 80 30 14 02 01 01 30 80"), Sha256Algorithm()}));
-  const size_t most = up_to_algorithm.size() - 4;  // less the element's own header
+  const size_t most = up_to_algorithm.size() - 4;  // 4: the header of `algorithm`
   for (const size_t length : {most, most + 1}) {
     const Bytes algorithm = der::Element(der::kSequence, Bytes(length));
     ASSERT_EQ(algorithm.size(), length + 4);

@@ -1,4 +1,5 @@
-// Three digests for the RSA tests. Verify checks a signature with all three digests.
+// Three digests for the RSA tests. Verify passes all three to rsa_pkcs1_verify. The DigestInfo in
+// the signature decides which of them is compared.
 #pragma once
 
 #include "crypto/rsa.h"

@@ -75,7 +75,8 @@ void Arm() {
   sigaction(SIGSEGV, &action, nullptr);
 }
 
-// True if this is the call that must fail. Calls none of the functions that this library replaces.
+// True if this is the call that must fail. The function itself uses none of the functions
+// that this library replaces.
 bool Fails(const char* name, int error, const void* caller = nullptr) {
   if (calls_left <= 0 || strcmp(name, function) != 0) return false;
   if (caller != nullptr && IsIn("/lib/apktoolkit/", caller)) return false;

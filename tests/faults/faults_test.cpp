@@ -58,7 +58,7 @@ class Installed {
 
   struct Outcome {
     ToolEnd ending;
-    bool failed;  // the run made the call of the fault, and this call failed
+    bool failed;  // the run made the call that the fault names, and this call failed
     // The kernel's signatures and libzu's registrations in order, one letter each. L: the library.
     // P: the package. J: a JAR. K: the package's key. N: this key under an empty name. ?: anything
     // else.
@@ -165,7 +165,7 @@ Installed PackageWithAnotherLibrary() {
 TEST(FailedCalls, RemoveOnlyDependentGrantsOfAGoodPackage) {
   Installed file = GoodPackage();
   ExpectRuns(file, "LPK",
-             {{"open", {"", "PK", "PK"}},     // the package; the library, to read it and to sign it
+             {{"open", {"", "PK", "PK"}},     // the package; the library twice: to read, to sign
               {"read", {"PK"}},               // the library
               {"fopen", {"PK", "LK"}},        // the tool's integrity value, before each signing
               {"fcntl", {"PK", "PK", "LK"}},  // a copy of the library's descriptor; each signing
@@ -257,10 +257,10 @@ void ExpectRunsWithoutMemory(Installed& file, const std::string& all,
 
 TEST(FailedAllocations, GiveAGoodPackageOnlyTheAllowedGrants) {
   Installed file = GoodPackage();
-  // The list has these texts. "": nothing is verified. "PK": the integrity value cannot be read
-  // before the library is signed. "LK": the value cannot be read before the package is signed.
-  // "LP": the permission is not found. "LPN": the package's name is empty. "LPK": the missing
-  // memory has no effect.
+  // The list has these texts. "": nothing is verified. "PK": the tool could not read the integrity
+  // value when it tried to sign the library. "LK": it could not read the value when it tried to
+  // sign the package. "LP": the permission is not found. "LPN": the package's name is empty. "LPK":
+  // the missing memory has no effect.
   ExpectRunsWithoutMemory(file, "LPK", {"", "PK", "LK", "LP", "LPN", "LPK"});
 }
 

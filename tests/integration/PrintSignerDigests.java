@@ -7,10 +7,10 @@ import java.security.cert.X509Certificate;
 import java.util.List;
 
 /**
- * PrintSignerDigests LEVEL FILE [JAR-SIGNER]: prints the digests that SignerDigests returns for the
- * signers that the package manager of API level LEVEL finds for the package FILE. If the digest
- * JAR-SIGNER is given, instead prints "true" if JAR-SIGNER is one of these digests, else "false".
- * Fails if the package manager would refuse the package.
+ * PrintSignerDigests LEVEL FILE [JAR-SIGNER]: finds the signers of the package FILE as the package
+ * manager of API level LEVEL does, and prints the digests that SignerDigests returns for them. If
+ * the digest JAR-SIGNER is given, instead prints "true" if JAR-SIGNER is one of these digests, else
+ * "false". Fails if the package manager would refuse the package.
  */
 public final class PrintSignerDigests {
     public static void main(String[] words) throws Exception {

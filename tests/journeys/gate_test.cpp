@@ -129,8 +129,9 @@ TEST(Signer, UnexpectedSignerIsShownInTextAndJournal) {
   EXPECT_NE(item["text"].get<std::string>().find(PublicKeyDigest("rsa-2048")), std::string::npos);
 }
 
-// The tool verifies the JAR signature of the package rotated-key, which is by the key rsa-2048. The
-// newest phones verify a signature of a newer scheme, which is by the key rsa-2048-other.
+// In the package rotated-key, the tool verifies the JAR signature. The key rsa-2048 made this
+// signature. The newest phones verify a signature of a newer scheme. The key rsa-2048-other made
+// that signature.
 TEST(Signer, KeyOfANewerSchemeMustBeExpectedToo) {
   const Lines first = {"--signer", ModulusDigest("rsa-2048")};
   const auto verdicts = [&](const Lines& more) {

@@ -1,6 +1,6 @@
 package android.content.pm;
 
-/** The part of the platform's class that SignerDigests uses. */
+/** Replaces the platform's class in tests. Has only what SignerDigests and its test use. */
 public final class SigningInfo {
     private final Signature[] signers;
 
