@@ -1,5 +1,5 @@
-// Good packages: which files are signed, with which payloads, which key is registered, and in which
-// order.
+// Runs the tool on good packages. Tests which files are signed with which payloads, which key is
+// registered, and the order of these events.
 #include <gtest/gtest.h>
 
 #include <filesystem>

@@ -1,5 +1,6 @@
 // Tests how the simulator reports the judgement of the phones' installer on real packages: in the
-// lines that a person reads, and in the journal.
+// lines that a person reads, and in the journal. apksig, the platform's own verifier, makes this
+// judgement.
 #include <gtest/gtest.h>
 
 #include <filesystem>
@@ -24,7 +25,8 @@ ProcessResult Run(const std::string& name, Lines options) {
   return RunProcess(options, Golden(name));
 }
 
-// The word of the verdict, the installer's line, and the status.
+// Returns the verdict, such as "NOT INSTALLABLE", the text of the installer's line if there is such
+// a line, and the simulator's exit status.
 Lines Told(const std::string& name, const Lines& options = {}) {
   const ProcessResult run = Run(name, options);
   EXPECT_EQ(run.errors, "");
@@ -209,8 +211,9 @@ TEST(Installer, RefusesAV3SignerWithoutALineageFromTheV2Signer) {
             Lines({"SIGNED", "phones of API 27 install it, verified by v2", "-> 0"}));
 }
 
-// Older versions of apksig do not know v3.1, and would name the first key for all phones. With each
-// version, the simulator must not report SIGNED.
+// Older versions of apksig do not know v3.1, and would name the first key for all phones. The
+// verdict for all phones together must differ from SIGNED, whatever the version of apksig. Phones
+// of API 27 to 32 do not use this package's v3.1 signature. The verdict for them alone is SIGNED.
 TEST(Installer, SignerOfSchemeV31IsNotSkipped) {
   const ProcessResult run = RunProcess(
       {SimulatorPath(), "--quiet", "--installer=required", Golden("later-v31") + "/base.apk"});
@@ -280,9 +283,9 @@ with zipfile.ZipFile("base.apk", "a") as archive:
   EXPECT_EQ(run.output.substr(0, 17), "NOT INSTALLABLE  ") << run.output << run.errors;
 }
 
-// This test's `java` waits 0.5 s, so that the tool's run normally ends first. Then it changes the
-// file and starts the verifier. The verdict of a changed file is NOT SIMULATED. A new hard link to
-// the file does not count as a change.
+// This test's `java` waits 0.5 s, so that the tool's run normally ends first. After the wait,
+// `java` changes the file and starts the verifier. The verdict of a changed file is NOT SIMULATED.
+// A new hard link to the file does not count as a change.
 TEST(Installer, FileThatChangesBeforeItsAnswerHasNoResult) {
   const TempDir directory;
   const std::string apk = directory / "base.apk";

@@ -32,7 +32,7 @@ std::string PlaceForAttributes() {
     const std::string file = directory.Write("probe", {});
     if (setxattr(file.c_str(), "user.zu", "1", 1, 0) == 0) return place;
   }
-  ADD_FAILURE() << "no file system with extended attributes of users";
+  ADD_FAILURE() << "no file system with user extended attributes";
   return "/tmp";
 }
 
@@ -229,7 +229,7 @@ TEST(FileThatIsNotAnArchive, EmptyFileIsRefusedByBothSigningSteps) {
   EXPECT_EQ(run.status, 1);
 }
 
-// The end-of-central-directory record alone.
+// An empty archive has only the end-of-central-directory record.
 TEST(FileThatIsNotAnArchive, EmptyArchiveIsRefusedByBothSigningSteps) {
   const TempDir directory;
   const std::string file = directory.Write("empty.zip", BuildZip({}));

@@ -38,9 +38,9 @@ TEST_F(Reason, LibraryInASubdirectoryOfItsAbiIsReported) {
             "installers do not extract it to lib/arm64/sub/libx.so, where the tool looks");
 }
 
-// A phone's installer extracts the libraries of only one ABI. With --install and --install=arm, the
-// simulator also extracts the libraries of only one ABI. The libraries of the other ABI do not
-// count as refused, even with --strict.
+// A phone's installer extracts the libraries of only one ABI. With --install or --install=arm, the
+// simulator does the same. The libraries of the other ABI do not count as refused, even with
+// --strict.
 TEST_F(Reason, LibrariesOfAnotherProcessorAreNotLaidOut) {
   Take("apksigner-sha256-2048");
   Do("rm -r lib");

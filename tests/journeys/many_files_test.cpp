@@ -39,8 +39,8 @@ class ManyFiles : public testing::Test {
     return RunProcess(command, directory_.path());
   }
 
-  // Each line of the output up to its first three blanks, then the exit status, then the text on
-  // standard error, if any.
+  // Each line of the output up to the first place with three blanks in a row, then the exit status,
+  // then the text on standard error, if any.
   static Lines Told(const ProcessResult& run) {
     Lines lines;
     std::istringstream text(run.output);
@@ -149,9 +149,9 @@ TEST_F(ManyFiles, TwoRunsOverOneFileGiveTheSameOutput) {
   }
 }
 
-// A file name that contains the placeholder <install> is shown unchanged. In the journal, only the
-// `path` of a file in the temporary directory begins with the placeholder. The `path` of the user's
-// file begins with a slash.
+// A file name that contains the placeholder <install> is shown unchanged. In the journal, a `path`
+// begins with the placeholder only if the file is in the temporary directory. The `path` of the
+// user's file begins with a slash.
 TEST_F(ManyFiles, NameThatLooksLikeThePlaceholderIsShownUnchanged) {
   const ProcessResult run =
       Do("mkdir '<install>'; cp good/base.apk '<install>'/; sim --journal journal "

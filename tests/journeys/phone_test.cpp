@@ -33,7 +33,8 @@ class GoodPackageOn : public testing::Test {
 };
 
 // The events of one failed attempt to sign a file. `kernels_part` has the events between the tool's
-// two messages: the reads of the integrity value, and the kernel's refusal if the tool asked.
+// two messages: the reads of the integrity value, and, if the tool asked the kernel to sign, the
+// kernel's refusal.
 std::string Refusal(const std::string& kernels_part, int error) {
   return Timeline({Log(4, "VeltSignOat: Apk case.\n"), kernels_part,
                    Log(6, "VELT can't sign a file (result=10000, errno " + std::to_string(error) +
@@ -78,8 +79,8 @@ TEST_F(GoodPackageOn, PhoneWithoutIntegrityFilesSignsNothing) {
   EXPECT_EQ(run.status, 1);
 }
 
-// The timeline without the values of errno. If no system call failed, errno has the value that some
-// earlier call left.
+// The timeline without the values of errno. If the tool reads an integrity value that does not
+// allow signing, no system call fails. The tool then logs the errno that an earlier call left.
 std::string WithoutErrno(const std::string& timeline) {
   return std::regex_replace(timeline, std::regex("errno [0-9]+: [^)]*"), "errno");
 }

@@ -24,9 +24,9 @@ inline std::string ByRsa2048() {
 inline constexpr size_t kAll = 1000;
 
 // Returns the first `lines` lines of `all`, and the last line of `all`, which is the status. The
-// first line is the verdict. If a later line starts with a cross (✗), the verdict repeats the
-// reason of the first line with a cross. This function checks the repeated reason. It then removes
-// this reason and the rest of the verdict's line.
+// first line is the verdict's line. If later lines start with a cross (✗), the verdict's line
+// repeats the reason that the first of them gives. This function checks the repeated reason. It
+// then removes this reason, and all text after the reason, from the verdict's line.
 inline Lines WithoutReason(size_t lines, Lines all) {
   const auto is_cross = [](const std::string& line) { return line.rfind("  ✗ ", 0) == 0; };
   const auto cross = std::find_if(all.begin(), all.end(), is_cross);
@@ -50,13 +50,13 @@ inline Lines WithoutReason(size_t lines, Lines all) {
   return all;
 }
 
-// A test that runs the simulator in its own directory, usually on a copy of a package that
-// make_golden_packages made.
+// A test with a directory of its own. The test runs the simulator in this directory, usually on a
+// copy of a package that make_golden_packages made.
 class Reason : public testing::Test {
  protected:
   // Copies a result of make_golden_packages into the test's directory. If `name` is a package, its
-  // copy is named base.apk. If `name` is a directory, its contents are copied: a package named
-  // base.apk and, if there are any, its extracted libraries.
+  // copy is named base.apk. If `name` is a directory, all its files are copied: a package named
+  // base.apk, the package's extracted libraries if it has any, and often other files.
   void Take(const std::string& name) {
     const std::filesystem::path source = std::filesystem::path(GOLDEN_PACKAGES) / name;
     if (std::filesystem::is_directory(source)) {

@@ -91,7 +91,8 @@ TEST_F(Reason, DsaKeyIsReported) {
                    "-> 1"}));
 }
 
-// The text of the cure also states its disadvantage: the package gets another signer.
+// The cure is the advice below the reason. This cure states its own disadvantage: the package gets
+// another signer.
 TEST_F(Reason, CureByAnotherKeyStatesItsDisadvantage) {
   for (const char* name : {"apksigner-ec", "apksigner-5120"}) {
     Do("rm -rf -- *");

@@ -108,9 +108,9 @@ TEST(SignerWarnings, SeveralSignersGiveAWarning) {
 }
 
 // The signer of the package "rotated-key" replaced an old key by a new key. The tool uses the old
-// key, which made the JAR signature. Phones that know the newest scheme use the new key. apksigner
-// signs with the new key in the newest scheme that apksigner knows: v3, or v3.1 from version 32 of
-// apksigner on.
+// key, which made the JAR signature. Phones that know the package's newest scheme use the new key.
+// apksigner signs with the new key in the newest scheme that apksigner knows: v3, or v3.1 from
+// version 32 of apksigner on.
 TEST(SignerWarnings, RotatedKeyGivesAWarning) {
   const std::string told = Told("rotated-key");
   const std::string schemes = LineWith(told, "schemes: ");

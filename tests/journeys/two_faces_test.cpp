@@ -1,7 +1,7 @@
 // Packages that the tool and other programs read differently. For example, the tool and another
-// program find different signers. The simulator must present the tool's signer, with the key that
-// the tool reads. Only warnings may name the key that other programs find. The most serious
-// warnings, the alarms, are also in the line of the verdict.
+// program find different signers. As the signer's key, the simulator must present the key that the
+// tool reads. Only warnings may name the key that other programs find. The most serious warnings,
+// the alarms, are also in the line of the verdict.
 #include <gmpxx.h>
 #include <gtest/gtest.h>
 #include <openssl/mem.h>

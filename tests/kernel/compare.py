@@ -96,7 +96,7 @@ def compare(kernel, expected, run):
 
 
 def probe_answers(kernel, files, run):
-    """Compares the results of the probe's calls, with errno."""
+    """Compares the result and errno of each call of the probe with those of the simulated run."""
     wanted = (files / f"{run.file}.out").read_text().splitlines()
     found = (kernel.results / f"{run.name}.out").read_text().splitlines()
     if found != wanted:
@@ -106,7 +106,7 @@ def probe_answers(kernel, files, run):
 
 
 def last_payloads(kernel, all_runs):
-    """The payload that each file was last signed with, by the file's path."""
+    """Maps the path of each signed file to the payload with which the file was last signed."""
     return {event["path"]: bytes.fromhex(event["payload"])
             for run in all_runs for event in kernel.events(run)
             if event["event"] == "sign" and event["result"] == 0}
@@ -163,11 +163,11 @@ def summary(expected, run):
         else:
             continue
         answers[answer] = answers.get(answer, 0) + 1
-    return ", ".join(f"{count} {answer}" for answer, count in answers.items()) or "nothing is asked"
+    return ", ".join(f"{count} {answer}" for answer, count in answers.items()) or "no answers"
 
 
 def print_table(kernels, expected, all_runs):
-    rows = [["", "what the phone did"] + [kernel.facts["release"] for kernel in kernels]]
+    rows = [["", "answers of the simulated phone"] + [kernel.facts["release"] for kernel in kernels]]
     rows += [["", ""] + [f"{k.facts['machine']}, {k.facts['page']} pages" for k in kernels]]
     rows += [["", ""] + ["SELinux enforcing" if k.has_policy else "" for k in kernels]]
     rows += [["", "seconds to boot, and to run"] +

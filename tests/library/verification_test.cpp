@@ -1,5 +1,5 @@
-// Tests each reason except kUnknown with an input that leads to the reason. Also tests the lines in
-// the log and the release of the archive.
+// Tests each reason except kUnknown with an input that leads to the reason. Also tests that the
+// tool's lines stay in the log, and that the archive is released.
 #include "library/verification.h"
 
 #include <fcntl.h>

@@ -25,10 +25,10 @@ int main(int count, char** words) {
 """
 
 # The flags of a hardened program, by part of the hardening. A row of BAD replaces the flags of one
-# part. The last part, "heap", means that the stack is not executable. This part needs no flag. Its
+# part. The last part, "exec", means that the stack is not executable. This part needs no flag. Its
 # entry has -O2, which _FORTIFY_SOURCE needs.
 GOOD = {"bind": "-Wl,-z,now", "table": "-Wl,-z,relro", "place": "-pie -fPIE",
-        "stack": "-fstack-protector-strong", "calls": "-D_FORTIFY_SOURCE=2", "heap": "-O2"}
+        "stack": "-fstack-protector-strong", "calls": "-D_FORTIFY_SOURCE=2", "exec": "-O2"}
 
 # A part, the flags that remove it, and the message for a program without it.
 BAD = [("bind", "-Wl,-z,lazy", "binds its symbols when they are called"),
@@ -36,7 +36,7 @@ BAD = [("bind", "-Wl,-z,lazy", "binds its symbols when they are called"),
        ("place", "-no-pie -fno-pie", "is not position-independent"),
        ("stack", "-fno-stack-protector", "no stack is protected"),
        ("calls", "-U_FORTIFY_SOURCE", "no call is checked"),
-       ("heap", "-O2 -Wl,-z,execstack", "is executable")]
+       ("exec", "-O2 -Wl,-z,execstack", "is executable")]
 
 
 def compiled(compiler, directory, parts, *more):

@@ -63,7 +63,7 @@ MODULES = {
 # More sources of a module. CMake has them in separate libraries.
 MORE = {"apktoolkit_sign_test": ["tests/support/phone.cpp"]}
 
-FIX = f"the lists and tables at the head of {__file__}, or the file that is named above"
+FIX = f"the lists and tables at the head of {__file__}, or the file that the printed problem names"
 
 
 def main():
