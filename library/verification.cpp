@@ -17,9 +17,9 @@ namespace {
 
 // The start of each line that the tool's code logs for a refusal, and the reason that the line
 // gives. If the manifest does not parse, two of these lines are logged. First the parser logs
-// "Parse manifest: ", as for a signature file. Then its caller logs "Can't load manifest: ". For
-// any other refusal, at most one of these lines is logged, possibly twice. The line that was logged
-// last therefore gives the reason.
+// "Parse manifest: ", as for a signature file. Then its caller logs "Can't load manifest: ". Any
+// other refusal logs none of these lines, or only one of them (once or twice). The line that was
+// logged last therefore gives the reason.
 constexpr struct LoggedReason {
   const char* start;
   Reason reason;
@@ -104,9 +104,9 @@ const char* TextOf(Reason reason) {
 namespace {
 
 // Returns the reason of a refusal. `logged` is the reason that the log gave, or kUnknown. The log
-// does not distinguish all cases, so the archive's entries are checked. The same line is logged if
-// "AndroidManifest.xml" is missing and if it cannot be extracted. No line is logged if
-// "META-INF/MANIFEST.MF" or the signature file is missing or cannot be extracted.
+// does not distinguish all cases, so the archive's entries are checked. A missing
+// "AndroidManifest.xml" is logged with the same line as one that cannot be extracted. No line is
+// logged if "META-INF/MANIFEST.MF" or the signature file is missing or cannot be extracted.
 Reason ReasonOf(Apk& apk, Reason logged) {
   if (logged == Reason::kAndroidManifestUnreadable) {
     return HasEntry(apk, "AndroidManifest.xml", "") ? logged : Reason::kNoPackage;
@@ -139,7 +139,7 @@ __attribute__((format(printf, 3, 0))) int HearAndLog(int priority, const char* t
   return __android_log_write(priority, tag, text);
 }
 
-// If `text` gives a reason, stores it for the verification that runs in this thread.
+// If `text` gives a reason, stores this reason for the verification that runs in this thread.
 void Hear(std::string_view text) {
   if (heard == nullptr) return;
   for (const auto& [start, reason] : kLoggedReasons) {

@@ -29,7 +29,7 @@ enum class Reason {
   kNoRsaBlock,                 // the signature block "*.RSA" is missing, or cannot be extracted
   kBlockMalformed,             // the block does not parse, or its key is not RSA
   kKeyRefused,                 // the key ends beyond the block, or has the exponent 1 or -1
-  kCertificateRefused,         // not signed with its own key, or its key or digest is unsupported
+  kCertificateRefused,         // certificate not self-signed, or with an unsupported key or digest
   kSignatureRefused,           // the block's signature does not cover the signature file
   kManifestRefused,            // the signature file has no digest of the manifest, or a wrong one
   kManifestMalformed,          // the manifest does not parse

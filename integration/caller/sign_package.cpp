@@ -63,7 +63,7 @@ const char* Describe(SignOutcome outcome) {
     case SignOutcome::kOtherSigner:
       return "not trusted: its JAR signer is not one of the package manager's signers";
     case SignOutcome::kNoJarSigner:
-      return "not trusted: it has no good JAR signature";
+      return "not trusted: it cannot be read, is not a package, or has no good JAR signature";
     case SignOutcome::kNotTrusted:
       return "not trusted: see the log of apktoolkit, or check that apktoolkit-verify runs";
     case SignOutcome::kTimedOut:

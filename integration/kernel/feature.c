@@ -11,9 +11,9 @@
  *   /proc/PID/integrity/value  the integrity value of a task, in hexadecimal
  *
  * The kernel itself is not changed. Kprobes redirect these two commands, and the look-up of
- * "integrity" in /proc/PID, to functions of this file. All other calls work as before. The module
- * has no exit function, so it cannot be unloaded: /proc keeps inodes whose operations are in the
- * module.
+ * "integrity" in /proc/PID, to functions of this file. All other calls work as before. /proc keeps
+ * inodes whose operations are in the module. The module therefore has no exit function, and cannot
+ * be unloaded.
  */
 #include <crypto/sha2.h>
 #include <linux/file.h>
@@ -314,8 +314,9 @@ static int look_up_entered(struct kprobe *probe, struct pt_regs *registers)
 	return 1;
 }
 
-/* Does nothing. The kernel can replace the breakpoint of a probe by a jump, but not if the probe
- * has a post handler. A handler that is reached by such a jump cannot redirect the call. */
+/* Does nothing, but must exist: the kernel can replace the breakpoint of a probe by a jump if the
+ * probe has no post handler. A pre-handler that is reached by this jump cannot redirect the call.
+ */
 static void after(struct kprobe *probe, struct pt_regs *registers, unsigned long flags)
 {
 }

@@ -12,9 +12,9 @@ struct file;
  * error number. */
 int journal_open(void);
 
-/* file: the file that is open as fd, or NULL. payload: the whole payload of `size` bytes, including
- * its first two bytes, which are the length of its data in host byte order. `size` is 0 if the
- * payload was not read. error: 0 or a negative error number. */
+/* file: the file that is open as fd, or NULL. payload: the whole payload of `size` bytes. The first
+ * two bytes are the length of the data after them, in host byte order. `size` is 0 if the payload
+ * was not read. error: 0 or a negative error number. */
 void journal_sign(int fd, struct file *file, const void *payload, size_t size, int error);
 void journal_verify(int fd, struct file *file, int error);
 

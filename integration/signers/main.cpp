@@ -37,10 +37,10 @@ constexpr int kNotStarted = 5;
 
 // Returns the SHA-256 digest of the JAR signer's modulus, in lower-case hexadecimal. The tool
 // passes the same digest to the kernel. Returns an empty text if the file cannot be opened, is not
-// a package, or has no readable META-INF/MANIFEST.MF. Also returns an empty text if the first
-// signature file is missing or malformed, or if the signature of this signature file is missing or
-// does not verify. A wrong digest in the signature file or in the manifest does not change the
-// result.
+// a package, or has no readable META-INF/MANIFEST.MF. Also returns an empty text if the package has
+// no signature file, if the first signature file is unreadable or malformed, or if the signature of
+// this signature file is missing or does not verify. A wrong digest in the signature file or in the
+// manifest does not change the result.
 std::string JarSigner(const char* file) {
   const ScopedFd fd(OpenForReading(file, O_CLOEXEC));
   if (fd.get() < 0) return {};

@@ -146,7 +146,9 @@ TEST_F(AfterAnUpdate, RefusedPackagesDoNotStopTheOthers) {
   EXPECT_EQ(
       run.output,
       other.path + ": not trusted: its JAR signer is not one of the package manager's signers\n" +
-          none.path + ": not trusted: it has no good JAR signature\n" + good.path + ": trusted\n");
+          none.path +
+          ": not trusted: it cannot be read, is not a package, or has no good JAR signature\n" +
+          good.path + ": trusted\n");
   EXPECT_EQ(run.status, 1);
 }
 
