@@ -54,8 +54,9 @@ def settled(lines):
 
 
 def checked(block, shell):
-    """Returns the block with the current output of its commands. Keeps the output on the page if it differs
-    from the current output only in the texts of VARIES."""
+    """Returns the block with the current output of its commands. If the page's output of a command
+    differs from the current output only in the texts of VARIES, returns the page's output for this
+    command."""
     lines = []
     for command, expected in shown_commands(block):
         shown = shell.run(command).stdout.replace(str(shell.directory), DIRECTORY).splitlines()

@@ -50,7 +50,8 @@ def runs(package, directory):
 
 
 def words_of(schema, name=""):
-    """The members of objects, and the values of enumerations. The reasons are in docs/messages.md."""
+    """The members of objects, and the values of enumerations. Leaves out the values of `reason`,
+    because docs/messages.md explains them."""
     if isinstance(schema, list):
         schema = dict(enumerate(schema))
     if not isinstance(schema, dict) or name == "reason":
@@ -78,8 +79,9 @@ def main():
     known = set(SCHEMA["$defs"]["verdict"]["properties"]["verdict"]["enum"])
     problems += [f"no run had the verdict {verdict}" for verdict in known - verdicts]
     # The schema must refuse an event that lacks a required member. The last event of each kind is
-    # tried. It has only required members: `installed` is optional in a start event, but the last
-    # start event has none. An exit event with a status and one with a signal are two kinds.
+    # tried. All its members are required: only a start event can have an optional member
+    # (`installed`), and the last start event does not have it. An exit event with a status and an
+    # exit event with a signal are two kinds.
     for event in seen.values():
         for member in event:
             poorer = {key: value for key, value in event.items() if key != member}

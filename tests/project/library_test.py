@@ -19,8 +19,8 @@ MARK = "== next command"
 
 
 def prepare(directory, build, package):
-    """Fills the directory in which the commands of examples/README.md run: with the examples, a
-    link to the build tree, and the packages that these commands use."""
+    """Puts the examples, a link to the build tree, and packages into `directory`. The commands of
+    examples/README.md run in this directory and use these packages."""
     shutil.copytree(ROOT / "examples", directory / "examples")
     (directory / "build").mkdir()
     (directory / "build/release").symlink_to(build)

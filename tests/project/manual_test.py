@@ -65,7 +65,7 @@ def main():
     completed = options(re.sub(r"#.*", "", (ROOT / "simulator/apktoolkit-sim.bash").read_text()))
     for where, found in (("manual page", described), ("completion", completed)):
         problems += [f"{option} is not in the {where}" for option in sorted(known - found)]
-        problems += [f"{option} in the {where} is no option" for option in sorted(found - known)]
+        problems += [f"{option} in the {where} is not an option" for option in sorted(found - known)]
     problems += run_examples(page, package, simulator)
     return report(problems, "man/*.1 and simulator/apktoolkit-sim.bash; the options are those of simulator/options.cpp")
 

@@ -1,7 +1,8 @@
 #!/usr/bin/env python3
-"""Compares parts of docs/messages.md with the sources: the priority and files of each message of
-the tool, and the tables of the simulator's reasons. Also compares the codes of the reasons in
-docs/journal.schema.json. With --write, writes these parts from the sources instead.
+"""Compares parts of docs/messages.md with the sources: the priority of each message of the tool,
+the source files that write it, and the tables of the simulator's reasons. Also compares the codes
+of the reasons in docs/journal.schema.json with the sources. With --write, writes all these parts
+from the sources instead.
 
 The explanation of each message is written by hand. The test fails if docs/messages.md has no entry
 for a message, or an entry for a message that the tool does not have. It also fails if the simulator
@@ -123,8 +124,8 @@ def reasons_problems(rows, messages):
     return problems
 
 
-# A row of the simulator's table of log texts: the meaning, the text, and the index of the
-# conversion to capture.
+# A row of the simulator's table of log texts: the meaning, the format text, and the index of the
+# printf conversion whose text is captured (or kNothing).
 LOG_LINES = ROOT / "simulator/run/log_lines.cpp"
 LOG_TEXT = re.compile(r"\{LogMeaning::k\w+,\s*(%s),\s*(\d+|kNothing)\}" % LITERALS)
 

@@ -51,7 +51,8 @@ def key_block_problems():
 
 
 def module_problems():
-    """The table of modules must have exactly the modules of the blueprint, without cc_defaults."""
+    """Checks that the table of modules names exactly those modules of the blueprint whose type is
+    not cc_defaults."""
     named = set(re.findall(r"^\| `(\w[\w-]*)` \|", section("In a platform tree"), re.M))
     built = {module["name"] for module in Blueprint(ROOT / "Android.bp").modules
              if module["type"] != "cc_defaults"}
@@ -59,8 +60,8 @@ def module_problems():
 
 
 def link_problems():
-    """Checks the page's links to its own headings, and that it links every directory of
-    integration/."""
+    """Checks that every #anchor to which the page links is one of its headings, and that the page
+    links every directory of integration/."""
     headings = {re.sub(r"[^\w\- ]", "", title.lower()).replace(" ", "-")
                 for title in re.findall(r"^#+ (.*)$", PAGE, re.M)}
     problems = [f"docs/porting.md has no heading #{anchor}"

@@ -1,9 +1,9 @@
 #!/usr/bin/env python3
 """Compares debian/changelog with CHANGES.md. With --write as the first argument, rewrites
-debian/changelog instead. Runs scripts/release in a new repository with good and bad tags. In this
-repository, stand-ins replace scripts/setup and scripts/reproducible. The stand-ins install nothing
-and build no real packages. The last argument is the build's version. The newest heading of
-CHANGES.md must have this version.
+debian/changelog instead. In both cases, runs scripts/release with good and bad tags in a new
+repository. In this repository, stand-ins replace scripts/setup and scripts/reproducible. The
+stand-ins install nothing and build no real packages. The last argument is the build's version. The
+newest heading of CHANGES.md must have this version.
 """
 
 import os
@@ -24,7 +24,7 @@ BUILDER = 'mkdir -p build/package && git rev-parse HEAD >build/package/tool.deb'
 def version_problems(version):
     newest = re.search(r"^## (\S+),", (ROOT / "CHANGES.md").read_text(), re.M)[1]
     if newest != version:
-        yield f"the newest heading of CHANGES.md is of {newest}, but {version} is built"
+        yield f"the newest heading of CHANGES.md has the version {newest}, but the build has {version}"
 
 
 class Repository:
@@ -105,7 +105,7 @@ def release_problems(repository):
         problems.append("the tarball's gzip header has a file name or a time")
     with tarfile.open(out / "apktoolkit-1.2.3.tar.gz") as tarball:
         if tarball.extractfile("apktoolkit-1.2.3/CHANGES.md").read().decode() != RELEASED:
-            problems.append("CHANGES.md in the tarball is not that of the tag")
+            problems.append("CHANGES.md in the tarball differs from CHANGES.md of the tag")
     if (out / "tool.deb").read_text() != repository.run("git", "rev-parse", "v1.2.3^{commit}"):
         problems.append("tool.deb was not built from the tag's commit")
     return problems

@@ -75,10 +75,10 @@ def run(simulator, directory, options, files):
 
 
 def junit_problems(verdicts, suites):
-    """Checks that each file has a test case, and that the totals are right. The test case of a file must
-    pass for status 0, fail for status 1, and be an error for any other status. If the first item of a
-    verdict is refused and the status is not 3, the type of the failure or error must be the code of
-    this item's reason."""
+    """Checks that each file has a test case, and that the totals are right. The test case of a file
+    must pass if the file's verdict has the status 0, fail if the status is 1, and be an error for
+    any other status. If the first item of a verdict is refused and the status is not 3, the type of
+    the failure or error must be the code of this item's reason."""
     cases = [case for suite in suites for case in suite]
     problems = [] if len(cases) == len(verdicts) else [f"{len(verdicts)} files, {len(cases)} cases"]
     for verdict, case in zip(verdicts, cases):

@@ -36,8 +36,9 @@ def without_comments(text):
 
 
 class Shell:
-    """Runs shell commands in `directory`. The name apktoolkit-sim starts the command line `simulator`, a
-    list of words. Each command sees the files and the exit status of the command before it."""
+    """Runs shell commands in `directory`. In these commands, apktoolkit-sim is a program that runs
+    the command line `simulator`, a list of words. Each command sees the files and the exit status
+    of the command before it."""
 
     def __init__(self, directory, simulator):
         self.directory, self.status = directory, 0

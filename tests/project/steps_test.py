@@ -51,8 +51,8 @@ def known_to_setup():
 
 
 def setup_problems():
-    """Checks that scripts/setup knows every step of scripts/check, and every step for which another
-    script calls it."""
+    """Checks that scripts/setup knows every step of scripts/check, and every step that a script
+    passes to scripts/setup by name."""
     asked = {("scripts/check", step) for step in listed_steps()}
     for path in (ROOT / "scripts").iterdir():
         asked |= {(f"scripts/{path.name}", word)

@@ -118,8 +118,8 @@ def is_whole(shell, name):
 
 
 def cut_journal_problems(shell):
-    """Checks that a journal that was cut off, as by a full disk, does not get the name of its
-    list."""
+    """Checks that a journal that was cut off, for example by a full disk, does not get the name of
+    its list."""
     command = shell.directory / "bin/apktoolkit-sim"
     whole = command.rename(command.with_name("whole"))
     command.write_text(f'#!/bin/sh\n{whole} "$@"; status=$?\nfor last; do :; done\n'

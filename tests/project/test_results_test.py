@@ -38,7 +38,7 @@ CASES = [  # the tests in the file, the expected lines, the expected exit status
                         "1 passed, 1 failed, 0 skipped"], 1),
     ([PASSED, TIMEOUT], ["FAILED A.Slow: Timeout", "1 passed, 1 failed, 0 skipped"], 1),
     ([PASSED, NOT_BUILT], ["FAILED A.Absent: Unable to find executable", "1 passed, 1 failed, 0 skipped"], 1),
-    # If no test ran, no test passed, so the run fails.
+    # A run fails if no test passed, even if no test failed.
     ([SKIPPED], ["skipped A.Skipped: no such kernel", "0 passed, 0 failed, 1 skipped"], 1),
     ([], ["0 passed, 0 failed, 0 skipped"], 1),
 ]

@@ -11,7 +11,8 @@ The dialect. A function that is read here may have only these forms:
                TYPE is uint32_t, uint64_t, int, bool, auto or lanes, perhaps with *. A narrower type
                would truncate its value, and no proof would notice this. `constexpr` is treated like
                `const`. A typedef is ignored.
-  statement    name = value;  also with += -= |= <<= >>=, to name, *name, name[i] or name->name;
+  statement    target = value;  or with += -= |= <<= >>= in place of =. The target is name, *name,
+               name[i] or name->name.
                ++name;  --name;  memcpy(&to, from, sizeof(to));  continue;  break;  return value;  a call.
   block        if (condition) and for (one; two; three), with a block or one statement. No else,
                while, switch or ?:.

@@ -4,8 +4,9 @@ zu.conf take the place of the platform's policy. The policy must grant exactly t
 GRANTED, and with libzu also those of GRANTED_WITH_ZU. Permissions that the level does not know are
 left out. If a rule of REFUSED is added, a neverallow rule must make the compilation fail.
 
-file_contexts must be valid. Each installed program must match exactly one of its patterns, and each
-pattern must match a program. m4, checkpolicy, secilc and setfiles are Debian's.
+file_contexts must be valid. The path of each installed program must match exactly one pattern of
+file_contexts, and each pattern must match a program. m4, checkpolicy, secilc and setfiles are
+Debian's.
 """
 
 import pathlib

@@ -19,7 +19,7 @@ constexpr char kSelf[] = "integrity /proc/self/integrity/value";
 constexpr uint8_t kPayload[] = {3, 0, 0xaa, 0xbb, 0xcc};  // length 3, then 3 bytes
 
 // The result codes are part of the interface: 0 for success, and 65536 for every failure. The code
-// is 65536 for every cause of a failure, and for every error number of the kernel.
+// does not depend on the cause, nor on the kernel's error number.
 TEST(VeltResultCode, EveryFailureIs65536) {
   constexpr uint32_t kFailure = 65536;
   Phone phone;

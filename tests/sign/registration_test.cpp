@@ -90,8 +90,8 @@ TEST(ZuSign, RegistersTheSecondDescriptor) {
 }
 
 TEST(ZuSign, PackageWithABadDexFileIsNotRegistered) {
-  // The permission is read only if META-INF/MANIFEST.MF verified, so this test damages only the dex
-  // file.
+  // The tool reads the permission only after it has verified META-INF/MANIFEST.MF. This test
+  // therefore damages only the dex file.
   Package package = SecureStoragePackage();
   package.Tamper("classes.dex");
   ArchiveOnPhone file(package);
@@ -121,7 +121,8 @@ TEST(ZuSign, JarWithoutTheAttributeIsSkippedSilently) {
   EXPECT_EQ(file.log.records(), Records());
 }
 
-// The attribute is read from the file of the first descriptor. Only the attribute's size is read.
+// An attribute of any size above 0 asks for the registration. The tool therefore reads only the
+// attribute's size, not its value.
 TEST(ZuSign, AttributeSizeIsReadFromTheFirstDescriptor) {
   ArchiveOnPhone file(MakePackage(PlainJar()));
   file.phone.zu_attribute_size = 1;
