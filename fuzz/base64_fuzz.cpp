@@ -1,5 +1,6 @@
 // apk/base64.h: decodes any text with Base64Decode. Also decodes the text with base64decode into a
-// buffer of 0 to 63 bytes. Both results must agree with ReadBase64 (fuzz/models.h).
+// buffer of 0 to 63 bytes. Both results must agree with ReadBase64 (fuzz/models.h). base64decode
+// must refuse a text whose bytes do not fit into the buffer.
 #include "apk/base64.h"
 
 #include "fuzz/fuzz.h"

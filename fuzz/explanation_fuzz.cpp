@@ -24,7 +24,6 @@ bool IsPartOf(std::string_view part, std::string_view whole) {
          (part.data() >= whole.data() && part.data() + part.size() <= whole.data() + whole.size());
 }
 
-// A certificate that parses has digests.
 void JudgeCertificate(std::string_view bytes) {
   const auto facts = ParseCertificate(bytes);
   ParseAlgorithm(bytes);

@@ -176,7 +176,7 @@ void MakeCompiledManifests() {
 }
 
 // `phone` is the first byte of the seed. Its bits set the phone's answers and the attacker
-// (fuzz/package_fuzz.cpp). 0: a phone without faults and no attacker. 2: each file has the
+// (fuzz/package_fuzz.cpp). 0: the phone has no faults, and no attacker acts. 2: each file has the
 // attribute "user.zu". 16: the integrity value settles at the second reading. 128: an attacker
 // replaces libraries.
 void SeedPackage(const std::string& name, const PackageOptions& options, uint8_t phone = 0) {

@@ -1,6 +1,6 @@
 // Runs the whole tool, from main() on, with any bytes as the package file. The phone is simulated
 // inside this program (support/phone.h). The first byte of the input sets the phone's answers, and
-// whether an attacker exchanges libraries. The other bytes are the package file. A model
+// whether an attacker replaces libraries. The other bytes are the package file. A model
 // (package_model.h) reads the same file, and must allow each signature and each registration that
 // the tool requests. The peak memory has a limit, and no descriptor may stay open.
 #include <dirent.h>

@@ -168,9 +168,9 @@ size_t DeclaredBytes(const Bytes& bytes) {
     std::string name;
     while (Next(cookie, &entry, &name) == 0) {
       // Deflate makes at most 1032 bytes from one byte. The tool does not extract an entry that
-      // declares a larger size.
+      // declares more than 1032 times its compressed length.
       if (entry.uncompressed_length > uint64_t{1032} * entry.compressed_length) continue;
-      // The platform's library keeps up to 64 KiB of memory for 40 bytes of a compiled manifest.
+      // The platform's XML parser keeps up to 64 KiB of memory for 40 bytes of a compiled manifest.
       // This is up to 1639 bytes of memory for each byte. package_fuzz.cpp permits kBytesPerByte
       // (16) bytes of memory for each byte counted here. A weight of 128 therefore permits 2048
       // bytes of memory for each byte of the compiled manifest.

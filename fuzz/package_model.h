@@ -1,8 +1,8 @@
 // A model of the tool's decisions. The fuzz target for packages compares the tool's actions with
-// the model. The model reads the archive through the platform's zip library, as the tool does. It
-// reads the manifest and the signature file with models.h, and checks signatures and digests with
-// libcrypto. The tool's own code finds two facts: the fields of the signature block (processCert),
-// and the path at which a library is installed. tests/crypto/pkcs7_test.cpp and
+// the model. Like the tool, the model reads the archive through the platform's zip library. The
+// model reads the manifest and the signature file with models.h, and checks signatures and digests
+// with libcrypto. The tool's own code finds two facts: the fields of the signature block
+// (processCert), and the path at which a library is installed. tests/crypto/pkcs7_test.cpp and
 // tests/apk/native_libraries_test.cpp test this code.
 #pragma once
 
@@ -54,7 +54,7 @@ class PackageModel {
 };
 
 // The sum of the sizes that the archive's entries declare. "AndroidManifest.xml" counts 128 times,
-// because the platform's library can use far more memory than this entry has bytes. An entry is
+// because the platform's XML parser can use far more memory than this entry has bytes. An entry is
 // left out if deflate cannot make the declared size from the entry's data: the tool does not
 // extract such an entry.
 size_t DeclaredBytes(const Bytes& archive);

@@ -11,9 +11,10 @@
 inline constexpr char kFuzzKey[] = "rsa-512";
 
 // Writes good signatures into the signature block: the certificate's signature, and the signer's
-// signature over the signature file. The block keeps its length and all other bytes. Does not write
-// a signature whose bytes are not all inside the block. Does nothing if the block does not parse,
-// if its modulus is not the fuzz key's, or if no private exponent exists for its public exponent.
+// signature over the signature file. The block keeps its length and all other bytes. Leaves out a
+// signature if any of its bytes would be outside the block. Does nothing if the block does not
+// parse, if its modulus is not the fuzz key's, or if no private exponent exists for its public
+// exponent.
 void SignAgain(Bytes& block, const Bytes& signature_file);
 
 // Writes the digests of `data` over the values of the attributes "SHA1-Digest" and

@@ -46,7 +46,7 @@ class Input {
   const uint8_t* const end_;
 };
 
-// The journal of a run, and the facts with which the functions below compare the verdict.
+// The journal of a run, and the outcomes with which the functions below compare the report.
 struct Run {
   std::string journal = Event("start").Text("file", "base.apk").Text("path", kPaths[0]).Line();
   std::vector<std::string> granted;  // the payload of each successful signing

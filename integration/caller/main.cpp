@@ -35,8 +35,8 @@ bool ReadLine(FILE* list, std::string* line) {
   return length > 0;
 }
 
-// Splits the line at its first blank into digests and path. The digests may be empty. Returns false
-// if the path is not absolute. The path may contain blanks.
+// Splits the line at its first blank into digests and path. The digests may be empty, and the path
+// may contain blanks. Returns false if the line has no blank, or if the path is not absolute.
 bool Parse(const std::string& line, InstalledPackage* package) {
   const size_t blank = line.find(' ');
   if (blank == std::string::npos || line.compare(blank, 2, " /") != 0) return false;
