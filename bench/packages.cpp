@@ -46,8 +46,9 @@ constexpr Plan kPlans[] = {
     {"entries-60k-unordered", 60000, 0, 0, 20 * kKilo, 40, "rsa-2048", false},
 };
 
-// Returns the bytes of all files of at least `least_size` bytes below a directory, one file after
-// the other. After the last file, Next() continues with the first file.
+// The bytes of all files of at least `least_size` bytes below a directory, one file after the
+// other. Each call of Next() returns the following `size` bytes. After the last file, Next()
+// continues with the first file.
 class CircleOfFiles {
  public:
   CircleOfFiles(const std::string& directory, size_t least_size);
@@ -144,7 +145,8 @@ std::string EntryName(size_t index) {
 }
 
 // Makes MakePackage add the digests of the manifest's sections to the signature file, as signing
-// tools do. MakePackage then also writes the text of MANIFEST.MF to `manifest`.
+// tools do. Before that, MakePackage writes the text of MANIFEST.MF to `manifest`. `manifest` must
+// therefore exist until MakePackage returns.
 void DescribeEntries(PackageOptions& options, std::string& manifest) {
   options.edit_manifest = [&](const std::string& text) { return manifest = text; };
   options.edit_signature_file = [&](const std::string& text) {

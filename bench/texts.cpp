@@ -4,9 +4,9 @@
 //
 //   READER <TAB> NAME <TAB> peak bytes for each byte of the text <TAB> nanoseconds for each byte
 //
-// The peak includes the text itself, so it is at least one byte for each byte of the text. Each
-// text is read in a separate process, so that memory that an earlier text left behind does not
-// count.
+// The peak includes the text itself, so the peak is at least one byte for each byte of the text.
+// Each text is read in a separate process. Memory that an earlier text left behind therefore does
+// not count.
 #include <sys/wait.h>
 #include <unistd.h>
 
@@ -83,9 +83,9 @@ constexpr Text kTexts[] = {
     {"one name without end", [] { return Repeat([](size_t) { return "A"; }); }},
 };
 
-// A document has one string of kLongName characters, and kManyNodes equal nodes. Because the nodes
-// are equal, deflate makes the document more than 300 times smaller. A small package can therefore
-// contain such a document.
+// A document is a compiled Android manifest. Each document has one string of kLongName characters,
+// and kManyNodes equal nodes. Because the nodes are equal, deflate makes the document more than 300
+// times smaller. A small package can therefore contain such a document.
 constexpr size_t kManyNodes = 1 << 20;
 constexpr size_t kLongName = 30000;
 
@@ -129,7 +129,8 @@ constexpr Reader kReaders[] = {
      std::size(kDocuments)},
 };
 
-// The peak memory of the process since ResetPeak, in KiB. Ends the process if it is not known.
+// The peak memory of the process since ResetPeak, in KiB. Ends the process if the peak is not
+// known.
 long PeakKilobytes() {
   std::ifstream status("/proc/self/status");
   for (std::string word; status >> word;) {

@@ -1,7 +1,7 @@
 # The language level, the warnings and the hardening of every target, and stricter rules for the
 # tool's own code. Options add sanitizers and coverage, or turn the hardening off. This file does
 # not turn warnings into errors; most presets in CMakePresets.json do. A new warning of a newer
-# compiler must not stop a build without a preset, such as that of a Debian package.
+# compiler must not stop a build without a preset, for example the build of a Debian package.
 set(CMAKE_CXX_STANDARD 17)
 set(CMAKE_CXX_STANDARD_REQUIRED ON)
 set(CMAKE_CXX_EXTENSIONS OFF)

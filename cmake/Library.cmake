@@ -1,7 +1,7 @@
-# Installs the files for programs that link the verification, such as examples/verify.cpp. They are
-# two static libraries (the tool's code, and library/), their headers, and the files for CMake's
-# find_package and for pkg-config. The directory include/apktoolkit has the layout of the sources,
-# because the headers include each other by their paths in the sources.
+# Installs the files that other programs, such as examples/verify.cpp, need to link the
+# verification. These files are two static libraries (the tool's code, and library/), their headers,
+# and the files for CMake's find_package and for pkg-config. The directory include/apktoolkit has
+# the layout of the sources, because the headers include each other by their paths in the sources.
 if(APKTOOLKIT_ZIPSTRING)
   return()  # this build uses the zip library of tests/compat, which is not installed
 endif()

@@ -301,9 +301,9 @@ WRAPS_ON_PURPOSE void subtract_with_borrow(int count, const uint32_t* s, uint32_
 
 // Adds s * b + c to d over `kCount` limbs; returns the carry. A vector has one limb in each lane. A
 // product of limbs is the sum of four products of half limbs. Each of the four is computed for all
-// lanes at once. The sums rx, ry and r1 do not wrap: (2^16 - 1)^2, the greatest product of half
-// limbs, plus two half limbs fits in 32 bits. The sums with c and d may wrap; their carries go to
-// c.
+// lanes at once. The greatest product of half limbs is (2^16 - 1)^2. This product plus two half
+// limbs fits in 32 bits, so the sums rx, ry and r1 do not wrap. The sums with c and d may wrap;
+// their carries go to c.
 template <int kCount>
 WRAPS_ON_PURPOSE uint32_t multiply_add(const uint32_t* s, uint32_t* d, uint32_t b, uint32_t c) {
   constexpr int kLanes = std::min(kCount, 4);

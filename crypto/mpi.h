@@ -58,8 +58,8 @@ int mpi_grow(mpi* X, int nblimbs);
 // X = A. X may be A. Limbs of X that A does not need are kept, and become zero.
 int mpi_assign(mpi* X, const mpi* A);
 
-// X = the unsigned big-endian number in the `len` bytes at `bytes`. An empty X gets only the limbs
-// that the number needs, and at least one. `bytes` may be null only if `len` is 0.
+// X = the unsigned big-endian number in the `len` bytes at `bytes`. An empty X gets as many limbs
+// as the number needs, but at least one. `bytes` may be null only if `len` is 0.
 int mpi_from_bytes(mpi* X, const uint8_t* bytes, size_t len);
 
 // Writes the magnitude of X as exactly `len` bytes, big-endian, with leading zero bytes. Returns
@@ -69,9 +69,9 @@ int mpi_to_bytes(const mpi* X, uint8_t* bytes, size_t len);
 // The bit length of the magnitude: one more than the index of the highest set bit, 0 for zero.
 int mpi_msb(const mpi* X);
 
-// mpi_compare_abs compares the magnitudes of A and B, and mpi_compare their values. Both return a
-// number below, equal to or above 0 if A is less than, equal to or greater than B. Two zeros are
-// equal even if their signs differ.
+// mpi_compare_abs compares the magnitudes of A and B. mpi_compare compares the values of A and B.
+// Both return a number below, equal to or above 0 if A is less than, equal to or greater than B.
+// Two zeros are equal even if their signs differ.
 int mpi_compare_abs(const mpi* A, const mpi* B);
 int mpi_compare(const mpi* A, const mpi* B);
 
