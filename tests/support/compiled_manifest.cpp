@@ -23,7 +23,8 @@ void PutChunkHeader(Bytes& out, uint16_t type, uint16_t header_length, size_t le
   Put32(out, static_cast<uint32_t>(length));
 }
 
-// Converts valid UTF-8. The C++ library's own conversion is deprecated, and newer libraries warn.
+// Converts UTF-8, in which three bytes may also encode an unpaired surrogate, to UTF-16. The C++
+// library's own conversion is deprecated: with a newer C++ library, the compiler warns about it.
 std::u16string ToUtf16(const std::string& text) {
   std::u16string units;
   for (size_t at = 0; at < text.size();) {

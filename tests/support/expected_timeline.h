@@ -13,7 +13,7 @@
 std::string Log(int priority, const std::string& text);
 // The tool read its own integrity value and found `text`.
 std::string Integrity(const std::string& text);
-// The tool tried to read its own integrity value, but the file did not exist.
+// The tool tried to read its own integrity value, but /proc/self/integrity/value did not exist.
 std::string IntegrityMissing();
 // The tool asked the kernel to sign the open file `fd`. `refusal` is the errno of the kernel's
 // refusal; 0: the kernel signed.

@@ -21,7 +21,7 @@ class FailingMalloc {
   int calls() const { return calls_; }
   // True if the call that must fail was made.
   bool failed() const { return failing_call_ != 0 && calls_ >= failing_call_; }
-  // The number of blocks that were returned and not yet freed.
+  // The number of watched blocks that are not yet freed.
   int live() const;
   // The number of watched blocks that were freed.
   int freed() const { return freed_; }

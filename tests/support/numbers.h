@@ -76,7 +76,7 @@ class Operands {
   std::mt19937 random_;
 };
 
-// The arguments of an operation X = A op B that are the same object.
+// Says which of X, A and B are the same object in an operation X = A op B.
 enum Alias { kNone, kXIsA, kXIsB, kAIsB, kAllOne, kAliases };
 
 struct Aliased {

@@ -45,8 +45,9 @@ test_key() {
   echo "$recipes_dir/keys/$1.pem"
 }
 
-# make_signer KEY DIRECTORY: makes a self-signed certificate KEY.pem for the fixed test key, and the
-# key in the forms for apksigner (KEY.pk8) and jarsigner (KEY.p12, alias cert, password android).
+# make_signer KEY DIRECTORY: writes a self-signed certificate of the fixed test key KEY to
+# DIRECTORY/KEY.pem. Also writes the test key to DIRECTORY, in the forms for apksigner (KEY.pk8) and
+# jarsigner (KEY.p12, alias cert, password android).
 make_signer() {
   local key out=$2/$1
   key=$(test_key "$1")

@@ -90,8 +90,8 @@ ssize_t __wrap___read_chk(int fd, void* buffer, size_t size, size_t /*room*/) {
   return __wrap_read(fd, buffer, size);
 }
 
-// Calls of open become calls of __open_2 in a build with _FORTIFY_SOURCE. Every platform tree
-// defines _FORTIFY_SOURCE.
+// In a build with _FORTIFY_SOURCE, calls of open become calls of __open_2. Every build in an
+// Android source tree defines _FORTIFY_SOURCE.
 int __wrap___open_2(const char* path, int flags) { return __wrap_open(path, flags); }
 
 FILE* __wrap_fopen(const char* path, const char* mode) {

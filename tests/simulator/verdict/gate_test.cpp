@@ -34,7 +34,8 @@ Report SignedBy(const CertificateFacts& signer, const std::string& file = "base.
   return report;
 }
 
-// The judgement of the phones from API level `first` on, which install the package for `signers`.
+// The judgement that the phones from API level `first` on install the package, with `signers` as
+// its signers.
 RangeJudgement Takes(int first, const std::vector<InstallerSigner>& signers) {
   RangeJudgement range;
   range.levels = {first, kNewestLevel};
@@ -184,12 +185,13 @@ TEST(Gate, SignersOfTheNewestSchemeMustBeExpectedAsWell) {
       InstalledFor(SignedBy(kOwner), {Takes(27, {{"v2", kOwner}, {"v3", kOther}})});
   ExpectUnexpected(owner, other);
   ExpectTaken({kOwner.sha256, kOther.sha256}, other);
-  // Each of several signers must be expected, for phones of every level.
+  // If the newest scheme has several signers, each of them must be expected. The signers for the
+  // phones of every API level are checked.
   ExpectUnexpected(owner,
                    InstalledFor(SignedBy(kOwner), {Takes(27, {{"v2", kOther}, {"v2", kOwner}})}));
   ExpectUnexpected(owner, InstalledFor(SignedBy(kOwner), {all_own, Takes(33, {{"v3", kOther}})}));
   ExpectUnexpected(owner, InstalledFor(SignedBy(kOwner), {Takes(27, {{"v2", kOther}}), all_own}));
-  // Phones that refuse the package do not install it for any signer.
+  // If phones refuse the package, its signers for these phones do not count.
   RangeJudgement refuses = Takes(33, {{"v3", kOther}});
   refuses.is_verified = false;
   ExpectTaken(owner, InstalledFor(SignedBy(kOwner), {all_own, refuses}));
@@ -406,7 +408,8 @@ TEST(OneSignerGate, SignersAreComparedInAnyOrder) {
                 kOther.key.modulus_sha256 + ")");
 }
 
-// If no installer is asked, the signers of the newest scheme in the file count.
+// Without an installer's judgement, the gate compares the signers of the newest scheme in each
+// file.
 TEST(OneSignerGate, NewestSchemesInTheFilesCountWithoutAnInstaller) {
   Report by_owner = SignedBy(kOwner), by_other = SignedBy(kOwner);
   by_owner.newer = {{"v2", kOther}, {"v3", kOwner}};

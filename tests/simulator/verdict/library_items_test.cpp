@@ -73,8 +73,8 @@ TEST(MakeReport, LibraryThatStaysInThePackageHasItsOwnReason) {
             "lib/arm64/libfoo.so absent library-in-package");
 }
 
-// The tool reads the entries in order and stops at a damaged entry. Later libraries are not signed,
-// even if they are good.
+// The tool goes through the library entries in order, and stops at the first damaged library entry.
+// Later libraries are not signed, even if they are good.
 TEST(MakeReport, LibraryAfterADamagedEntryIsRefusedIfInstalled) {
   const auto items = [](int error, bool is_strict) {
     PackageFacts facts =

@@ -72,8 +72,9 @@ inline Lines Items(const Events& events, const PackageFacts& facts = {}) {
   return ItemsOf(Made(events, facts));
 }
 
-// Log lines of the tool. kTakesUp is the line before the tool asks the kernel to sign a package or
-// its library. The other two lines start the steps that sign the libraries and the file.
+// Log lines of the tool. The tool logs kTakesUp before it decides whether it asks the kernel to
+// sign the package or a library. kLibrariesStart is the first line of the step that signs the
+// libraries, and kFileStart is the first line of the step that signs the file.
 inline const Json kTakesUp = Log(4, "VeltSignOat: Apk case.\n");
 inline const Json kLibrariesStart = Log(4, "VeltSignJni starts: 3.\n");
 inline const Json kFileStart = Log(4, "VeltSign starts: zip_fd = 3, fd = 3.\n");

@@ -125,8 +125,7 @@ TEST(WhyRefused, ExplainsARefusedCertificate) {
   facts.jar.certificate->is_self_issued = false;
   facts.jar.certificate->issuer = "CN=Authority";
   EXPECT_EQ(Why(errors, facts), "certificate-issued CN=Authority");
-  // The sizes in bytes of the largest key that the tool accepts, of a key that is too large, of the
-  // smallest key that the tool accepts, and of a key that is too small.
+  // A modulus of 16 to 512 bytes is not refused for its size.
   const auto of_size = [&](uint32_t size) {
     facts.jar.key->size = size;
     facts.jar.key->bits = static_cast<int>(size) * 8 - 1;
@@ -150,8 +149,8 @@ TEST(WhyRefused, ExplainsARefusedSignature) {
   facts.jar.block.digest = "SHA512";
   facts.jar.block.has_known_digest = false;
   EXPECT_EQ(Why(errors, facts), "signature-digest SHA512");
-  // If the block could not be read to its last signer, the reason is not an unknown digest
-  // algorithm.
+  // If the block cannot be read to its last signer, `has_known_digest` is ignored. `has_pss` and
+  // `has_signed_attributes` still decide.
   facts.jar.block.is_whole = false;
   EXPECT_EQ(Why(errors, facts), "signature-wrong META-INF/CERT.RSA");
   facts.jar.block.has_pss = true;

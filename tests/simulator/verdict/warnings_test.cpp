@@ -71,7 +71,8 @@ TEST(Warnings, CertificateWithAnotherKeyThanTheKernelsIsReported) {
   EXPECT_EQ(cause::kCertificateOtherKey.severity, Severity::kAlarm);
 }
 
-// The key that the kernel got counts, even if the file now shows another key.
+// The warning compares the JAR signer's certificate with the key that the kernel got, even if the
+// file now shows another key.
 TEST(Warnings, CertificateIsComparedWithTheKeyThatTheKernelGot) {
   Report report = ReportOf(Good());
   report.key->sha256 = kOther;
@@ -152,8 +153,9 @@ TEST(Warnings, KeyThatMatchesOnlyInPartIsReported) {
   EXPECT_EQ(Warnings(facts).size(), 1U);
   facts.newer = {{"v2", CertificateWith("CN=other", kOther, "jar key")}};
   EXPECT_EQ(Warnings(facts).size(), 1U);
-  // Without a readable certificate, only the key that the kernel got can be compared. The missing
-  // certificate causes one more warning, block-ambiguous.
+  // If the JAR signer's certificate cannot be read, the key of a v2 or v3 signer is compared only
+  // with the key that the kernel got. The unreadable certificate also causes the warning
+  // block-ambiguous.
   facts.jar.certificate.reset();
   facts.newer = {{"v2", CertificateWith("CN=other", kOther, "jar key")}};
   EXPECT_EQ(Warnings(facts).size(), 2U);
