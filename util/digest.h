@@ -16,8 +16,8 @@ void ComputeSHA1Digest(const std::vector<uint8_t>& in, std::vector<uint8_t>& out
 // 32 bytes.
 void ComputeSHA256Digest(const std::vector<uint8_t>& in, std::vector<uint8_t>& out);
 
-// The digests of signed data with the three algorithms above. A signature itself names its digest
-// algorithm.
+// The digests of signed data with the three algorithms above. A signature's verification gets all
+// three, because the signature itself names its digest algorithm.
 struct Digests {
   std::vector<uint8_t> sha1;
   std::vector<uint8_t> sha256;

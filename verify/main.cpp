@@ -1,7 +1,7 @@
 // apktoolkit-verify prints one line per file: whether the kernel trusts the file. The program does
 // not read the files and logs nothing. The kernel alone decides whether a regular file is trusted.
-// No other file is trusted. Exit status: 0 if all files are trusted; 1 if a file is not trusted or
-// cannot be opened; 2 if the command line is wrong or the output cannot be written.
+// A file of any other kind is not trusted. Exit status: 0 if all files are trusted; 1 if a file is
+// not trusted or cannot be opened; 2 if the command line is wrong or the output cannot be written.
 #include <fcntl.h>
 #include <sys/stat.h>
 #include <unistd.h>
@@ -43,8 +43,8 @@ int main(int argc, char* argv[]) {
 
 namespace {
 
-// True if there is at least one file and no option. The program has no options. An argument that
-// begins with "-" is refused, and is not treated as a file's name.
+// True if there is at least one argument, and no argument begins with "-". The program has no
+// options. It nevertheless refuses a file's name that begins with "-".
 bool IsCommandLineRight(int argc, char* argv[]) {
   for (int i = 1; i < argc; ++i) {
     if (argv[i][0] == '-') return false;

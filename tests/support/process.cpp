@@ -29,7 +29,7 @@ bool Redirect(int number, const std::string& path, int flags) {
                      Redirect(STDERR_FILENO, errors, O_WRONLY | O_CREAT) &&
                      (directory.empty() || chdir(directory.c_str()) == 0);
   // Closes the descriptors that this process inherited, such as ctest's log. Otherwise the files
-  // that the command opens would get other descriptor numbers.
+  // that the command opens could get higher descriptor numbers than the tests expect.
   closefrom(STDERR_FILENO + 1);
   if (ready) execvp(arguments[0], arguments.data());
   perror(arguments[0]);

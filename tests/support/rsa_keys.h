@@ -1,4 +1,4 @@
-// RSA key pairs, a context of crypto/rsa.h for each, and the padded blocks that they sign.
+// RSA key pairs, each with a context of crypto/rsa.h, and padded blocks to sign with the keys.
 #pragma once
 
 #include <gmpxx.h>
@@ -65,8 +65,8 @@ struct FixedKey {
   rsa_local context;
 };
 
-// A key for a size that libcrypto does not make: two primes from GMP, exponent 65537. `size` is the
-// length of the modulus in bytes.
+// A key of a size for which libcrypto makes no keys. GMP finds the two primes, and the exponent is
+// 65537. `size` is the length of the modulus in bytes.
 struct SmallKey {
   explicit SmallKey(size_t size) {
     const mpz_class e = 65537;

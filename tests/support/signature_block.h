@@ -20,9 +20,10 @@ struct SignatureBlock {
   // The INTEGER of the serial number in the SignerInfo; unset: the serial number of the signer's
   // certificate.
   std::optional<Bytes> serial;
-  // The signature covers authenticated attributes, which contain the digest of the signature file.
+  // True: the signature covers authenticated attributes, which contain the digest of the signature
+  // file.
   bool authenticated_attributes = false;
-  // The signer uses other bytes in place of the signature file.
+  // True: the signer digests and signs other bytes in place of the signature file.
   bool wrong_digest = false;
 
   // The contents of the element [0], which has the certificates. If set to no bytes, the element is

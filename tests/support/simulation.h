@@ -33,7 +33,8 @@ std::vector<std::string> FirstLines(size_t count, const std::vector<std::string>
 // some system calls in place of the kernel.
 bool AreProgramsEmulated();
 
-// The paths of the built programs. Under an emulator, these are paths of scripts that start them.
+// The paths of the built programs. Under an emulator, each path is that of a script that starts the
+// program.
 std::string ToolPath();
 std::string SimulatorPath();
 std::string VerifyPath();

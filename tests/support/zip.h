@@ -1,9 +1,9 @@
 // Writes ZIP archives. A test can set false values in their headers and data descriptors.
 //
-// A length or CRC that an item leaves unset gets its true value. Exception: in the local header, it
-// is 0 if a data descriptor follows. A value that is set in `local` is written unchanged, and
-// only into the local header. The values of `central` are for the central header, and those of
-// `descriptor` are for the data descriptor.
+// A length or CRC that an item leaves unset gets its true value. Exception: if a data descriptor
+// follows, an unset value is 0 in the local header. A value that is set in `local` is written
+// unchanged, and only into the local header. The values of `central` are for the central header,
+// and those of `descriptor` are for the data descriptor.
 #pragma once
 
 #include <cstdint>
@@ -25,7 +25,7 @@ struct ZipItem {
   std::string name;  // any bytes
   Bytes data;
   bool deflated = false;
-  // The local header leaves lengths and CRC to a data descriptor after the data.
+  // True: the local header leaves lengths and CRC to a data descriptor after the data.
   bool data_descriptor = false;
 
   std::optional<Bytes> raw = {};        // in the archive in place of the (compressed) data

@@ -27,10 +27,11 @@ Bytes WithForgedBlock(const Bytes& exponent) {
   return ToBytes(ContentOf(apk));
 }
 
-// The tool reads the first four bytes of each exponent as 1 or -1. If an exponent is shorter, the
-// tool reads the missing bytes as 0. Bytes 5 to 8 of a longer exponent overwrite the length of the
-// modulus: 256, which is stored as the bytes 00 01 00 00. In this test, bytes 5 to 8 equal the
-// bytes that they overwrite, so that the length does not change.
+// The tool reads an exponent's first four bytes in host byte order. For each exponent in this test,
+// the result is 1 or -1. If an exponent is shorter, the tool reads the missing bytes as 0. Bytes 5
+// to 8 of a longer exponent overwrite the length of the modulus: 256, which is stored as the bytes
+// 00 01 00 00. In this test, bytes 5 to 8 equal the bytes that they overwrite, so that the length
+// does not change.
 TEST(Threat, ExponentReadAsOneOrMinusOneIsRefused) {
   for (const char* exponent :
        {"01", "01 00", "01 00 00", "01 00 00 00", "FF FF FF FF", "01 00 00 00 00 01",

@@ -41,8 +41,8 @@ class Device {
   std::string Path(const std::string& path) const { return temp_ / ("app/" + path); }
 
   // Runs the steps. Returns the files that the tool asks the Phone to sign with the payload for the
-  // key of `signer`, in the order of these requests. Also returns files that the Phone refuses to
-  // sign. The names are relative to the directory above the package's directory.
+  // test key `signer`, in the order of these requests. The result includes files that the Phone
+  // refuses to sign. The names are relative to the directory above the package's directory.
   Strings FilesSignedFor(const std::string& signer) {
     const std::string payload = "2000" + Hex(DigestOf(Digest::kSha256, ModulusOf(signer)));
     return FilesSignedWith(payload);

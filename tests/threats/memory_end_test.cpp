@@ -1,6 +1,6 @@
-// Puts compiled Android manifests, JAR manifests, and the tables of JAR manifests in a block at the
-// end of a memory area (support/memory_end.h). If the platform's parser or the tool's code reads
-// beyond the area, the test crashes.
+// Puts three kinds of data in a block at the end of a memory area (support/memory_end.h): compiled
+// Android manifests, JAR manifests, and the tables that the tool makes from JAR manifests. If the
+// platform's parser or the tool's code reads beyond the area, the test crashes.
 #include <gtest/gtest.h>
 
 #include "apk/apk.h"
@@ -12,9 +12,9 @@
 
 namespace {
 
-// Parses the document at the end of memory, in the block that the tool allocates for it. The block
-// is 20 bytes longer than the document, because the platform's parser can read an attribute (20
-// bytes) or a chunk header (8 bytes) that ends beyond the document.
+// Parses the document. The block that the tool allocates for the document is put at the end of the
+// memory area. The block is 20 bytes longer than the document, because the platform's parser can
+// read an attribute (20 bytes) or a chunk header (8 bytes) that ends beyond the document.
 bool ParseAtMemoryEnd(ApkTools::Apk* apk, const Bytes& document) {
   PutNextBlockAtMemoryEnd(document.size() + 20);
   const bool parsed = apk->ParseAndroidManifest(document);
@@ -104,8 +104,9 @@ TEST(EntryDigestsAtMemoryEnd, AreSortedWithoutAccessBeyondTheTable) {
   EXPECT_EQ(digest, "1");
 }
 
-// The table is sorted when the name of a new attribute starts at offset 1024 of the text or later.
-// Here, the 33rd attribute is the first such attribute (32 * 32 = 1024). It also fills the table.
+// In the first section, the table is sorted for the first time when a new attribute's name starts
+// at offset 1024 of the text or later. Here, this is the 33rd attribute (32 * 32 = 1024), which
+// also fills the table.
 TEST(ManifestSectionsAtMemoryEnd, AreNotReadBeyondTheLastAttribute) {
   constexpr uint32_t kAttributes = 33;
   std::string text;
@@ -122,9 +123,10 @@ TEST(ManifestSectionsAtMemoryEnd, AreNotReadBeyondTheLastAttribute) {
   EXPECT_EQ(sections[0].find("83"), std::string(30, 'v'));
 }
 
-// The parser reads eight bytes at once. Names and lines of values therefore have each length from 1
-// to 19 bytes: shorter and longer than eight bytes, with each remainder. The text is cut at each
-// multiple of 4 bytes, because only a block of such a size ends exactly at the end of the area.
+// The parser reads eight bytes at once. The test therefore uses names and value lines of every
+// length from 1 to 19 bytes. These lengths are below and above eight bytes, and leave every
+// remainder when they are divided by eight. The text is cut at each multiple of 4 bytes, because
+// only a block of such a size ends exactly at the end of the area.
 TEST(JarManifestAtMemoryEnd, IsNotReadBeyondTheBlockAtAnyLength) {
   for (size_t length = 1; length < 20; ++length) {
     const std::string run(length, 'v');

@@ -102,8 +102,9 @@ TEST(OwnMetaInf, GetsItsOwnPayload) {
 
 // ---- The tool compares only the local names of attributes.
 
-// The tool reads the package's name from x:package. The installer reads it from package. The tool
-// registers the key although the package only declares the permission and does not request it.
+// The tool reads the package's name from the attribute "x:package". The installer reads the name
+// from the attribute "package". The tool registers the key although the Android manifest declares
+// the permission (<permission>) but does not request it (<uses-permission>).
 TEST(AttributeInAnotherNamespace, NamesAnotherPackageThanTheInstallerReads) {
   const std::string apk = Made("attribute");
   const ProcessResult installer = RunProcess({"aapt", "dump", "permissions", apk});

@@ -75,9 +75,9 @@ TEST(Threat, FirstCertificateAndFirstSignatureOfTwoSignersCount) {
 }
 
 // The certificate's modulus is the signer's modulus with four more bytes. The tool writes the fifth
-// to eighth bytes of the exponent over the modulus length (crypto/pkcs7.h). Here these bytes are 00
-// 01 00 00, which is 256 in host byte order, so the tool ignores the last four bytes of the
-// modulus. Other programs read a key of 2080 bits.
+// to eighth bytes of the exponent over the modulus length (crypto/pkcs7.h). Here, these bytes are
+// 00 01 00 00. In host byte order, they are the number 256, so the tool ignores the last four bytes
+// of the modulus. Other programs read a key of 2080 bits.
 TEST(Threat, ModulusWithExtraBytesIsTheKeyThatItStartsWith) {
   Package package = MakePackage();
   Certificate certificate;

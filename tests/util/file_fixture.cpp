@@ -30,8 +30,8 @@ ssize_t __wrap_readlink(const char* path, char* buffer, size_t size) {
 }
 
 // In a build with _FORTIFY_SOURCE, calls of read and readlink can become calls of __read_chk and
-// __readlink_chk. The linker redirects these calls to the two functions below. Every platform
-// tree defines _FORTIFY_SOURCE.
+// __readlink_chk. The linker redirects these calls to the two functions below. A build inside the
+// source tree of the Android platform always defines _FORTIFY_SOURCE.
 ssize_t __wrap___read_chk(int fd, void* buffer, size_t size, size_t /*room*/) {
   return __wrap_read(fd, buffer, size);
 }

@@ -1,7 +1,7 @@
 // Tests rsa_pkcs1_verify on vectors in the format of Project Wycheproof's
-// rsa_signature_*_test.json: the vectors of this project, those of Wycheproof for SHA-256 and keys
-// of 2048 and 3072 bits, and those in the directory that the CMake variable
-// APKTOOLKIT_WYCHEPROOF_DIR names.
+// rsa_signature_*_test.json. Some vectors are this project's own. The others are Wycheproof's
+// vectors for SHA-256 with keys of 2048 or 3072 bits. The CMake variable APKTOOLKIT_WYCHEPROOF_DIR
+// can name a directory with more vectors.
 #include <gtest/gtest.h>
 #include <openssl/bn.h>
 #include <openssl/nid.h>
@@ -216,8 +216,8 @@ GTEST_ALLOW_UNINSTANTIATED_PARAMETERIZED_TEST(VectorsOfTheDirectory);
 INSTANTIATE_TEST_SUITE_P(Files, VectorsOfTheDirectory, testing::ValuesIn(NamesInTheDirectory()),
                          [](const auto& parameter) { return parameter.param; });
 
-// This project has shortened copies of some files of the directory (wycheproof_*.json). If a file
-// has such a copy, take_wycheproof must print exactly the copy.
+// This project's files wycheproof_*.json are shortened copies of Wycheproof's files. If a file of
+// the directory has a shortened copy, take_wycheproof must print exactly this copy for the file.
 TEST_P(VectorsOfTheDirectory, GetTheExpectedVerdictsAndMatchTheirCopies) {
   EXPECT_GT(JudgeFile(file_).refused, 0);
   std::string kept = GetParam() + ".json";
