@@ -65,8 +65,8 @@ class Apk {
   bool IsApk() const { return is_apk_; }
   // The package attribute of the Android manifest, UTF-8; may be empty.
   const std::string& GetPackageName() const { return package_name_; }
-  // The signer's RSA modulus from the last signature block that InitCertSf verified. Empty if
-  // InitCertSf verified no block. Big-endian; one leading zero byte is left out.
+  // The signer's RSA modulus, from the signature block of the last call of InitCertSf that
+  // succeeded. Empty if no call succeeded. Big-endian; one leading zero byte is left out.
   const std::vector<uint8_t>& GetManufacturerKey() const { return manufacturer_key_; }
   // The Android manifest was parsed, and asks for secure storage: it requests or declares the
   // secure-storage permission, or has a "meta-data" element with the name "access" and the value

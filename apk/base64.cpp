@@ -22,8 +22,9 @@ int base64decode(const char* in, size_t length, uint8_t* out, size_t* out_length
   size_t written = 0;
   uint32_t accumulator = 0;
   int collected = 0;  // number of 6-bit values in the accumulator
-  // Writes the whole bytes of the accumulator. Returns false if they do not fit. Deliberate: bits
-  // that do not fill a byte are dropped without an error. A single 6-bit value is thus dropped.
+  // Writes the complete bytes of the accumulator to `out`. Returns false if `out` has too little
+  // space. Deliberate: bits that do not fill a byte are dropped without an error. A single 6-bit
+  // value is thus dropped.
   const auto flush = [&] {
     const size_t count = collected < 2 ? 0 : static_cast<size_t>(collected) - 1;
     if (*out_length - written < count) return false;

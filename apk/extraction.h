@@ -1,6 +1,6 @@
 // Extracts an entry into memory. The signature does not cover the lengths that an archive declares,
 // so each length is checked before memory is allocated for it. Results are the zip library's codes
-// (0: success). This code logs nothing, but the zip library can log a failure.
+// (0: success). These functions log nothing, but the zip library can log a failure.
 #pragma once
 
 #include <ziparchive/zip_archive.h>
@@ -28,10 +28,10 @@ bool IsPlausibleLength(const ZipEntry& entry);
 
 // Extracts the whole entry into `out`. If the declared length is impossible, returns
 // kZipInconsistentInformation. If the declared length is more than kZipTrustedLength, the data is
-// first read once: if this reading fails, returns the library's code. If the entry then does not
-// fit in memory, returns kZipAllocationFailed. In these three cases, `out` stays unchanged. In all
-// other cases, `out` gets the declared length. The result is then the library's code for the
-// extraction.
+// first read once. If this reading fails, returns the library's code. If this reading succeeds, but
+// the entry does not fit in memory, returns kZipAllocationFailed. After each of these three
+// failures, `out` is unchanged. Otherwise `out` gets the declared length, and the result is the
+// library's code for the extraction.
 int32_t ExtractZipEntry(ZipArchiveHandle archive, ZipEntry* entry, std::vector<uint8_t>& out);
 
 }  // namespace ApkTools

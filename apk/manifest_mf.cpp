@@ -31,8 +31,8 @@ bool IsPlainText(const uint8_t* eight) {
 //
 // The parser is lenient where signing tools differ. Lines may have any length, and may end with
 // CR LF, LF CR, CR or LF. A name extends to the next colon, and may contain line breaks. The parser
-// is strict about the byte after this colon: it must be a space, CR or LF. Unusual line breaks
-// decide which digest belongs to which entry, so tests pin how the parser reads them.
+// is strict about the byte after this colon: it must be a space, CR or LF. Unusual line breaks can
+// change which digest an entry gets, so tests pin how the parser reads them.
 class Parser {
  public:
   Parser(std::vector<uint8_t>& text, ManifestSections& sections)
@@ -116,11 +116,12 @@ class Parser {
   }
 
   // Deliberate: if a line break follows the colon directly, the cursor always moves to the second
-  // byte after the colon. After CR LF or LF CR, that byte is the second byte of the line break.
-  // After a lone CR or LF, that byte is the first byte of the next line. The parser then treats
-  // this first byte as the line break. A name on the next line loses its first byte. An empty line,
-  // or a continuation line with one space, is not recognised. Signing tools write CR LF. For texts
-  // with other line breaks, the result must not change.
+  // byte after the colon. If the line break is CR LF or LF CR, that byte is its second byte. If the
+  // line break is a lone CR or LF, that byte is the first byte of the next line. The parser then
+  // treats this first byte as the line break. A name on the next line loses its first byte. The
+  // next line is not recognised if it is empty, or if it is a continuation line that starts with a
+  // single space. Signing tools write CR LF. Texts with other line breaks have always been read by
+  // this rule, so the rule must stay.
   bool passColon() {
     const char next = byteAt(cursor_ + 1);
     if (next != ' ' && !IsLineBreak(next)) {

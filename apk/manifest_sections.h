@@ -88,8 +88,8 @@ class ManifestSections {
   // opens an empty section. Attributes that are added afterwards must be pieces of the `size` bytes
   // at `text`.
   void reset(const uint8_t* text, size_t size);
-  // Adds an attribute to the open section. The attribute's name and value must not be empty. The
-  // next sort of the section drops an attribute if a later attribute has the same name.
+  // Adds an attribute to the open section. Neither the attribute's name nor its value may be empty.
+  // The next sort of the section drops an attribute if a later attribute has the same name.
   void add(const ManifestAttribute& attribute);
   // Sorts and ends the open section, which may be empty, and opens the next section. Only ended
   // sections are visible.
@@ -97,8 +97,8 @@ class ManifestSections {
 
  private:
   // add() also sorts the open section from time to time, so that repeated names do not fill the
-  // memory. Before each such sort, at least this many bytes of text follow the section's start or
-  // its last sort.
+  // memory. In a section, the attributes that cause two such sorts start at least this many bytes
+  // apart. The first such sort in a section can come after less text.
   static constexpr size_t kLittleText = 1024;
 
   size_t openStart() const { return ends_.empty() ? 0 : ends_.back(); }

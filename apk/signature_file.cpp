@@ -20,7 +20,7 @@ int LoadKey(const std::vector<uint8_t>& block, const pkcs7& record, rsa_context&
 int VerifySignature(const rsa_context& key, const std::vector<uint8_t>& block,
                     const Digests& digests, const uint8_t* signature);
 
-// A modulus of more bytes does not become a manufacturer key.
+// VerifyCertificate refuses a modulus of more than this many bytes.
 constexpr uint32_t kLongestKey = 2047;
 
 }  // namespace

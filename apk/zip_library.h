@@ -81,7 +81,7 @@ inline int32_t StartZipIteration(ZipArchiveHandle archive, void** cookie, const 
   return StartIteration(archive, cookie, ZipFilter(first), ZipFilter(last));
 }
 
-// Returns the next entry and its name. Changes `name` only if the result is 0.
+// Stores the next entry in `*entry` and its name in `name`. Changes `name` only if the result is 0.
 inline int32_t NextZipEntry(void* cookie, ZipEntry* entry, std::string& name) {
   ZipName found;
   const int32_t result = Next(cookie, entry, &found);

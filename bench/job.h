@@ -40,8 +40,8 @@ std::string SignatureFileName(const GivenPackage& package);
 std::string WalkManifest(const Buffer& compiled_manifest);
 
 // Does three things for each library beside the package: reads the whole file, calls `check` with
-// the entry's name and the file's bytes, and writes the log lines of a failed signature. On a
-// workstation, the tool cannot sign and writes the same lines.
+// the entry's name and the file's bytes, and logs that the kernel did not sign the file. The tool
+// writes the same log lines on a workstation, because the kernel there cannot sign files.
 using CheckLibrary = std::function<void(const std::string& name, const Buffer& content)>;
 void SignLibraries(const GivenPackage& package, const CheckLibrary& check);
 void SignGiven(const GivenPackage& package);
