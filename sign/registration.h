@@ -5,8 +5,8 @@
 
 // If the file asks for a registration, calls ZuNewCertificate of libzu for `fd`. Exception: if the
 // package failed the verification, or the JAR's path cannot be found, only logs an error. If the
-// file does not ask for one, does nothing and logs nothing. `zip_fd` and `fd` stay open. Only the
-// log reports the result.
+// file asks for no registration, does nothing and logs nothing. `zip_fd` and `fd` stay open. Only
+// the log reports the result.
 //
 // A package asks in its AndroidManifest.xml (Apk::IsSsPermissionRequired). The signer's key is
 // registered under the package name. A plain JAR asks with a non-empty extended attribute "user.zu"

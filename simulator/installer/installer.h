@@ -1,7 +1,7 @@
 // The installer of the phones: the platform's own verifier, apksig, in a Java program
 // (InstallerVerifier.java). The first package of a run starts a process of this program. The
-// process says for each package whether phones install it. If the process fails on a package, the
-// next package starts a new process.
+// process says for each package whether phones install it. If the process gives no answer for a
+// package, the next package starts a new process.
 #pragma once
 
 #include <sys/types.h>
@@ -16,8 +16,8 @@
 
 namespace simulator {
 
-// kAuto: Judge asks the installer if Missing() returns none. kRequired: the run also fails if
-// Missing() returns a text. kOff: Judge never asks the installer.
+// kAuto: Judge asks the installer if Missing() returns none. kRequired: the same, but the run fails
+// if Missing() returns a text. kOff: Judge never asks the installer.
 enum class InstallerUse { kAuto, kRequired, kOff };
 
 struct InstallerOptions {

@@ -4,8 +4,8 @@
 // messages of the library and of the tool's code are dropped.
 //
 // The library maps a part of the file into memory. If the file becomes shorter while an Archive
-// exists, pages beyond the new end read as zeros. HasShrunk() is true after such a read. Both hold
-// only in the thread that made the Archive (simulator/package/shrinking.h).
+// exists, pages beyond the new end read as zeros. HasShrunk() is true after such a read. Both
+// rules hold only in the thread that made the Archive (simulator/package/shrinking.h).
 #pragma once
 
 #include <ziparchive/zip_archive.h>
@@ -41,7 +41,8 @@ inline constexpr EntryNames kSignatureFileNames = {"META-INF/", ".SF"};
 // The entries of one kind, in the order in which the zip library returns them to the tool.
 struct ArchiveWalk {
   std::vector<std::string> names;  // without those of damaged entries
-  // The number of these names that the tool reaches. The tool stops at the first damaged entry.
+  // The number of these names that the tool reaches. The tool stops at the first damaged entry
+  // of this kind.
   size_t met = 0;
 };
 
