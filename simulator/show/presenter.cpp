@@ -136,8 +136,8 @@ int Presenter::Finish(const std::vector<std::string>& files) {
   return EndWith(status_);
 }
 
-// The number of files that were not shown because of an interruption. Returns none if all files
-// were shown, and no shown report has the cause kInterrupted.
+// Returns none if all files were shown, and no shown report has the cause kInterrupted. Otherwise
+// the run was interrupted: returns the number of files that were not shown, which can be 0.
 std::optional<size_t> Presenter::Unseen() const {
   const size_t unseen = file_count_ - shown_;
   if (unseen == 0 && !is_interrupted_) return std::nullopt;

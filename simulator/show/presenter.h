@@ -32,8 +32,8 @@ class Presenter {
   // `file_count`: the number of files to show.
   Presenter(const ShowOptions& options, size_t file_count);
 
-  // Returns a reason not to begin if OutputFile::Objection has one for an output, or if two outputs
-  // are the same file. Otherwise returns none.
+  // Returns an error text if two outputs are the same file, or if OutputFile::Objection objects to
+  // an output. The run must then not begin. Otherwise returns none.
   std::optional<std::string> Objection(const std::vector<std::string>& inputs) const;
   // Opens the outputs. If an output cannot be written, returns the reason, and the caller must call
   // GiveUp. Otherwise returns none.
@@ -49,8 +49,8 @@ class Presenter {
   // the reports for other programs. Returns the highest status of all files, or at least
   // kCannotSimulate if an output failed.
   int Finish(const std::vector<std::string>& files);
-  // Called instead of Show and Finish if no file can be simulated because of `problem`. The page
-  // and the reports then have an error for each file. Returns the exit status.
+  // Called instead of Show and Finish if `problem` prevents the whole run. The page and the reports
+  // then have an error for each file. Returns the exit status.
   int GiveUp(const std::vector<std::string>& files, const std::string& problem);
 
  private:
@@ -81,7 +81,7 @@ class Presenter {
   int status_ = kAllSigned;
 };
 
-// Prints `message`, an error, and returns `status`.
+// Prints the error text `message`. Returns `status`.
 int Complain(int status, const std::string& message);
 
 // If standard output could not be written and the run was not interrupted, prints an error and

@@ -3,9 +3,9 @@
 // of level "error", with one exception: an item of severity kFollows (simulator/verdict/causes.h)
 // is left out if the file also has a refused item of another severity. Each warning is a result of
 // level "warning". The rules are the causes of the results. A file that was not looked at, or not
-// simulated, is a notification of level "error", and the run then counts as not successful. In
-// messages, hidden characters (IsHidden in simulator/phone/text.h) and bytes that are not UTF-8
-// become \xNN. In URIs, paths are percent-encoded.
+// simulated, gets a notification of level "error" in addition to its results, and the run then
+// counts as not successful. In messages, hidden characters (IsHidden in simulator/phone/text.h) and
+// bytes that are not UTF-8 become \xNN. In URIs, paths are percent-encoded.
 #pragma once
 
 #include <map>

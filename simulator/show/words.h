@@ -56,7 +56,8 @@ std::string MissingInstaller(const Report& report);
 
 // The facts after the file's name in the verdict's line, in this order:
 // - DecisiveReason, or OwnerFacts if DecisiveReason is empty;
-// - the reasons for which the gate (gate.h) refused the signer, without the decisive reason;
+// - the reasons for which the gate (gate.h) refused the signer, except the decisive reason and a
+//   reason of severity kFollows;
 // - AlarmFacts;
 // - the number of all warnings, unless it is 0.
 std::vector<std::string> HeadFacts(const Report& report, const char* ellipsis);
@@ -103,8 +104,8 @@ std::string TextOf(const Link& link);
 using Rows = std::vector<std::pair<std::string, std::string>>;
 // The facts of a certificate, as libcrypto reads it. The tool has its own parser.
 Rows CertificateRows(const CertificateFacts& certificate);
-// The facts of the JAR signer: the certificate, and the digest of the key that the kernel got or
-// that the tool would send.
+// The facts of the JAR signer: its certificate, and the digest in Report::key. The kernel got this
+// digest, or the tool would send it.
 Rows SignerRows(const Report& report);
 
 // The words for the parts of the package in Protection (simulator/verdict/report.h).

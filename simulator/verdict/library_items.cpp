@@ -52,7 +52,7 @@ Reason WhyKernelDidNotSign(const Attempt& attempt) {
   if (attempt.outcome != Attempt::Outcome::kNotAsked) return {};
   if (!attempt.integrity) return {&cause::kIntegrityMissing, ""};
   unsigned value = 0;
-  // The tool also reads the value with the format %x.
+  // The tool reads the value with the same format, %x.
   if (sscanf(attempt.integrity->c_str(), "%x", &value) != 1) {
     return {&cause::kIntegrityUnreadable, *attempt.integrity};
   }
@@ -129,8 +129,8 @@ Reason WhyNotVerified(const Library& library, const RunRecord& run, const Packag
   return {is_changed_inside ? &cause::kLibraryChangedInside : &cause::kLibraryChanged, ""};
 }
 
-// If the tool cannot open a library for the digest, the log does not say why. The simulator
-// therefore opens the file as well: `library.error` is the errno that the simulator got.
+// If the tool cannot open a library to compute its digest, the log does not say why. The simulator
+// therefore opens the library as well: `library.error` is the errno that the simulator got.
 Reason WhyNotThere(const LibraryFacts& library, const RunRecord& run, const PackageFacts& facts) {
   const int error = library.error;
   if (error == EACCES || error == EPERM) return {&cause::kLibraryNoPermission, ""};

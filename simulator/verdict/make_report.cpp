@@ -137,7 +137,8 @@ Item OwnItem(const RunRecord& run, const PackageFacts& facts, const JudgeOptions
 }
 
 // The kind that the tool saw. A file that the tool could not open as an archive is neither a
-// package nor a JAR. Only the payload of a JAR has no digest (kNoData).
+// package nor a JAR. The payload of a JAR has no digest (kNoData), and the payload of a package
+// has one.
 ItemKind KindOf(const RunRecord& run) {
   constexpr char kNoData[] = "0000";
   if (run.is_jar || (run.own && run.own->payload == kNoData)) return ItemKind::kJar;

@@ -19,7 +19,6 @@ struct JudgeOptions {
   int64_t now = 0;
 };
 
-// `installer`: the judgement of the phones' installer.
 Report MakeReport(const RunRecord& run, const PackageFacts& facts, const JudgeOptions& options,
                   const Judgement& installer = {});
 

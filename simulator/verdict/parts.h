@@ -44,8 +44,8 @@ void AddInstallerItem(const Judgement& judgement, const JudgeOptions& options,
 bool IsJarSigner(const PublicKey& key, const Report& report);
 
 // The warnings: facts that the user should look at. Reads only three members of `report`: the
-// items, the signer and the key. Leaves out an exponent or a changed entry that an item already
-// reports. `now` is JudgeOptions::now.
+// items, the signer and the key. Does not warn about a forgeable key or a changed entry that an
+// item already reports. `now` is JudgeOptions::now.
 std::vector<Reason> FindWarnings(const RunRecord& run, const PackageFacts& facts,
                                  const Report& report, int64_t now = 0);
 

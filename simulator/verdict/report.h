@@ -61,8 +61,9 @@ struct Reason {
 // kSigner and kWarnings are other reasons to refuse the file.
 struct Item {
   ItemKind kind;
-  std::string name;   // of a library: its path below the package's directory; of a key: the
-                      // package or JAR in its registration; may be empty
+  std::string name;   // of a library: its path below the package's directory, or else its entry;
+                      // of a key: the package or JAR in its registration; empty if libzu was
+                      // not asked
   std::string entry;  // of a library: its entry in the package
   ItemState state;
   Reason reason;  // a null cause if the state is kDone
@@ -139,14 +140,13 @@ const Item* DecisiveItem(const Report& report);
 // that installs the package. Reads only the signer and the key of the report.
 const CertificateFacts* OtherSigner(const Judgement& judgement, const Report& report);
 
-// True for an item of the tool's own run. All other items are about the phones' installer or
-// about a demand that is not met (gate.h).
+// False for an item about the phones' installer, or about a demand that is not met (gate.h). True
+// for all other items.
 bool IsByTool(const Item& item);
 
 // True for a file that was signed in this run; false for a registered key.
 bool IsSigned(const Item& item);
 
-// The exit status for a verdict.
 ExitStatus StatusOf(Verdict verdict);
 
 }  // namespace simulator
