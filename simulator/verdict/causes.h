@@ -103,7 +103,7 @@ inline constexpr Cause kNotBegun = {"not-begun", Group::kSimulation, Severity::k
 inline constexpr Cause kFileChanged = {"file-changed", Group::kSimulation, Severity::kFailed,
     ChainLink::kKey, "", "it was changed during the run", "Run again when nobody writes to it."};
 inline constexpr Cause kInterrupted = {"interrupted", Group::kSimulation, Severity::kFailed,
-    ChainLink::kKey, "", "it was interrupted", "Run it again."};
+    ChainLink::kKey, "", "it was interrupted", "Run again."};
 
 // ---- The kind of the file.
 inline constexpr Cause kFolder = {"folder", Group::kFile, Severity::kRefused, ChainLink::kKey,
@@ -284,7 +284,7 @@ inline constexpr Cause kEntryEncrypted = {"entry-encrypted", Group::kSignature, 
     "Build the package again without a password."};
 inline constexpr Cause kNoMemory = {"no-memory", Group::kSignature, Severity::kRefused,
     ChainLink::kCertificate, "`RSA could not`", "the tool had no memory left",
-    "Run it again with more memory."};
+    "Run again with more memory."};
 
 // ---- The kernel.
 inline constexpr Cause kKernelRefused = {"kernel-refused", Group::kKernel, Severity::kRefused,
@@ -450,7 +450,7 @@ inline constexpr Cause kEntriesMissing = {"entries-missing", Group::kWarning, Se
 inline constexpr Cause kEntriesNotCompared = {"entries-not-compared", Group::kWarning,
     Severity::kAlarm, ChainLink::kNone, "", "%s not compared with the manifest: unreadable, too "
     "long, without a SHA-1 or SHA-256 digest, or not reached before the time limit",
-    "unzip -t names an unreadable entry. Run it again with a larger --timeout. Entries above 512 "
+    "unzip -t names an unreadable entry. Run again with a larger --timeout. Entries above 512 "
     "MiB are not compared."};
 inline constexpr Cause kWeakKey = {"weak-key", Group::kWarning, Severity::kWarning,
     ChainLink::kNone, "", "its RSA key has %s bits; fewer than 2048 bits are not safe",

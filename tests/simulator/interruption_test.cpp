@@ -62,7 +62,7 @@ TEST(Interruption, EndsTheToolAndTheSimulatorByTheSignal) {
     EXPECT_EQ(kill(std::stoi(ContentOf(pid)), 0), -1) << "the tool must have ended";
     const std::string start =
         "NOT SIMULATED  " + slow.path() +
-        "   it was interrupted\n  ✗ tool  it was interrupted\n      Run it again.\n";
+        "   it was interrupted\n  ✗ tool  it was interrupted\n      Run again.\n";
     EXPECT_EQ(run.output.substr(0, start.size()), start);
   }
 }
