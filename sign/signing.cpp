@@ -117,10 +117,10 @@ std::vector<uint8_t> SignPayload(const std::vector<uint8_t>& data) {
 // Otherwise returns true, even if the library was not signed. In that case, the failure is already
 // logged.
 bool SignLibrary(ApkTools::Apk& apk, const std::string& entry_name, const std::string& target) {
-  // The digested file stays open until this function returns. Otherwise, after its deletion, a new
-  // file could get its inode number. IsSameFile could then mistake the new file for the digested
-  // file. The descriptor `kept` has a high number, so that the file to sign gets the lowest free
-  // descriptor.
+  // The digested file stays open until this function returns. If the digested file were closed and
+  // deleted, a new file could get the same inode number. IsSameFile could then mistake the new file
+  // for the digested file. The descriptor `kept` has a high number, so that the file to sign gets
+  // the lowest free descriptor.
   constexpr int kFarDescriptor = 100;
   const ScopedFd kept(fcntl(ScopedFd(OpenForReading(target.c_str(), O_CLOEXEC)).get(),
                             F_DUPFD_CLOEXEC, kFarDescriptor));
@@ -130,7 +130,7 @@ bool SignLibrary(ApkTools::Apk& apk, const std::string& entry_name, const std::s
   const ScopedFd library(OpenForReading(target.c_str(), 0));
   if (library.get() < 0) {
     const int error = errno;
-    // Deliberate: the text has no line end. Programs that parse the log match on it.
+    // Deliberate: the text has no line end. Programs that parse the log match on this exact text.
     LogError("File %s is not opened", target.c_str());
     LogError("Error %d: %s.\n", error, strerror(error));
     return true;

@@ -329,7 +329,8 @@ void AddRun(CLI::App* app, Options* options, std::string* runner) {
 }
 
 // With --verify, nothing is signed, and there are no registrations and no verdicts. --verify
-// therefore excludes the options about these. It also excludes --recursive.
+// therefore excludes the options about signing, registrations and verdicts. It also excludes
+// --recursive.
 void AddVerify(CLI::App* app, Options* options) {
   CLI::Option* const verify = app->add_flag("--verify", options->verify,
                                             "Sign nothing. Run the apktoolkit-verify beside\n"

@@ -30,8 +30,9 @@ import java.util.SortedSet;
 import java.util.TreeSet;
 
 public final class InstallerVerifier {
-    // The levels at which the rules change. The platform reads v3 from 28 on, requires v2 or later
-    // from 30 on if the app targets 30 or later, and reads v3.1 from 33 on.
+    // The API levels at which the platform's rules for signature schemes change. The platform reads
+    // v3 from 28 on, requires v2 or later from 30 on if the app targets 30 or later, and reads v3.1
+    // from 33 on.
     private static final int KNOWS_V3 = 28;
     private static final int ASKS_FOR_V2 = 30;
     private static final int KNOWS_V31 = 33;
@@ -226,8 +227,8 @@ public final class InstallerVerifier {
         return range;
     }
 
-    // True if the cause of the exception is an entry whose data are longer than the entry states.
-    // In this case, the file itself could be read.
+    // True if the cause of the exception is an entry whose data are longer than its declared
+    // length. The package is then malformed, and reading the file did not fail.
     private static boolean isOfDamagedData(Throwable failure) {
         for (Throwable cause = failure; cause != null; cause = cause.getCause()) {
             if (cause instanceof BufferOverflowException) {

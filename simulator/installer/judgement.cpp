@@ -106,7 +106,8 @@ bool ReadSigners(const Json& json, std::vector<InstallerSigner>* signers) {
   return true;
 }
 
-// An odd number of digits is malformed: the null character after the text completes the last pair.
+// Returns none if the text is malformed. An odd number of digits is refused, because the last digit
+// is then paired with the text's terminating NUL, which is not a digit.
 std::optional<std::string> FromHex(const std::string& digits) {
   constexpr char kDigits[] = "0123456789abcdef";
   std::string bytes;

@@ -47,7 +47,7 @@ struct Judgement {
   enum class State {
     kNotAsked,  // the verifier was not asked, for example because the file is not a package
     kMissing,   // Java, apksig or the program that calls apksig is missing
-    kGaveUp,    // the verifier gave no valid answer before the deadline
+    kGaveUp,    // the verifier failed, or gave no valid answer before the deadline
     kJudged,
   };
 

@@ -5,7 +5,7 @@
 //
 // The library maps a part of the file into memory. If the file becomes shorter while an Archive
 // exists, pages beyond the new end read as zeros. HasShrunk() is true after such a read. Both
-// rules hold only in the thread that made the Archive (simulator/package/shrinking.h).
+// statements hold only in the thread that made the Archive (simulator/package/shrinking.h).
 #pragma once
 
 #include <ziparchive/zip_archive.h>
