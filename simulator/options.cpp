@@ -237,7 +237,7 @@ void AddInstaller(CLI::App* app, Options* options) {
   };
   app->add_option_function<std::string>("--api", set,
                                         "Ask about phones with these API levels\n"
-                                        "[default: 27 and later]")
+                                        "[default: 27-, which means 27 and later]")
       ->type_name("LEVEL[-LEVEL]")
       ->check(is_range);
 }
