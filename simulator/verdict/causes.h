@@ -101,19 +101,20 @@ inline constexpr Cause kNotBegun = {"not-begun", Group::kSimulation, Severity::k
     ChainLink::kKey, "", "no file could be simulated: %s",
     "Fix the reported error, and run again."};
 inline constexpr Cause kFileChanged = {"file-changed", Group::kSimulation, Severity::kFailed,
-    ChainLink::kKey, "", "it was changed during the run", "Run again when nobody writes to it."};
+    ChainLink::kKey, "", "it was changed during the run", "Run again when nobody writes to the "
+    "file."};
 inline constexpr Cause kInterrupted = {"interrupted", Group::kSimulation, Severity::kFailed,
     ChainLink::kKey, "", "it was interrupted", "Run again."};
 
 // ---- The kind of the file.
 inline constexpr Cause kFolder = {"folder", Group::kFile, Severity::kRefused, ChainLink::kKey,
-    "`OpenArchiveFd(`", "it is a directory",
-    "Name the package inside it, or give --recursive."};
+    "`OpenArchiveFd(`", "it is a directory", "Name the package inside it, or give --recursive."};
 inline constexpr Cause kPackageDirectory = {"package-directory", Group::kFile, Severity::kRefused,
     ChainLink::kKey, "`OpenArchiveFd(`", "it is a directory with %s in it",
     "Name every package in it, the base and its splits: DIRECTORY/*.apk. Or give --recursive."};
 inline constexpr Cause kSpecialFile = {"special-file", Group::kFile, Severity::kRefused,
-    ChainLink::kKey, "`OpenArchiveFd(`", "it is a device, a pipe or a socket", "Name a file."};
+    ChainLink::kKey, "`OpenArchiveFd(`", "it is a device, a pipe or a socket",
+    "Name a regular file."};
 inline constexpr Cause kEmptyFile = {"empty-file", Group::kFile, Severity::kRefused,
     ChainLink::kKey, "`OpenArchiveFd(`", "it is empty, a file of 0 bytes",
     "Build, copy or download it again."};
@@ -164,10 +165,10 @@ inline constexpr Cause kUnsigned = {"unsigned", Group::kSignature, Severity::kRe
     ChainLink::kKey, "", "it is unsigned: META-INF/MANIFEST.MF is missing",
     "Sign it: apksigner sign --v1-signing-enabled true."};
 inline constexpr Cause kNewerSchemeOnly = {"newer-scheme-only", Group::kSignature,
-    Severity::kRefused, ChainLink::kKey, "", "it is signed only with %s, and this tool reads JAR "
-    "signatures (v1): META-INF/MANIFEST.MF is missing", "Sign it with v1 as well: enableV1Signing "
-    "true for the Gradle plugin, or apksigner sign --v1-signing-enabled true --min-sdk-version "
-    "23."};
+    Severity::kRefused, ChainLink::kKey, "", "it is signed only with %s, and this tool reads only "
+    "JAR signatures (v1): META-INF/MANIFEST.MF is missing", "Sign it with v1 as well: "
+    "enableV1Signing true for the Gradle plugin, or apksigner sign --v1-signing-enabled true "
+    "--min-sdk-version 23."};
 inline constexpr Cause kManifestUnreadable = {"manifest-unreadable", Group::kSignature,
     Severity::kRefused, ChainLink::kManifest, "", "META-INF/MANIFEST.MF cannot be extracted",
     "Copy or build the package again; unzip -t names the damaged entry."};
@@ -352,8 +353,7 @@ inline constexpr Cause kLibraryMissing = {"library-missing", Group::kLibrary, Se
     ChainLink::kNone, "`Can't open file`", "it is not beside the package, but other libraries are",
     "Install the package again, unless the installer leaves this library out on purpose."};
 inline constexpr Cause kLibraryOtherAbi = {"library-other-abi", Group::kLibrary, Severity::kNothing,
-    ChainLink::kNone, "", "the tool knows no directory for its ABI",
-    "Nothing to do."};
+    ChainLink::kNone, "", "the tool knows no directory for its ABI", "Nothing to do."};
 inline constexpr Cause kPackageRefused = {"package-refused", Group::kLibrary, Severity::kFollows,
     ChainLink::kNone, "`VeltSignJni: malformed apk`, `Apk archive is not valid`",
     "the package is refused", "First fix the reason why the package is refused."};
@@ -407,7 +407,7 @@ inline constexpr Cause kSignerUnexpected = {"signer-unexpected", Group::kGate, S
     "Sign it with the key that --signer names; a rotated key has to be named as well. If you did "
     "not build it, do not trust it."};
 inline constexpr Cause kSignerNone = {"signer-none", Group::kGate, Severity::kRefused,
-    ChainLink::kNone, "", "it has no signer: the kernel trusts the JAR by its bytes (%s)",
+    ChainLink::kNone, "", "it has no signer: the kernel trusts the bytes of the JAR (%s)",
     "Run without --signer for JARs."};
 inline constexpr Cause kSignerNotVerified = {"signer-not-verified", Group::kGate,
     Severity::kFollows, ChainLink::kNone, "", "its signer is not known: the tool verified no "

@@ -65,7 +65,7 @@ GROUPS = {"kNotLookedAt": "The tool did not look at the file",
           "kSignature": "A package's signature", "kKernel": "The kernel", "kLibrary": "A library",
           "kKey": "The key", "kTool": "The tool itself",
           "kInstaller": "The installer of the phones",
-          "kGate": "Demands of --signer and --werror, and of one signer for each package", "kWarning": "Warnings"}
+          "kGate": "Demands of --signer and --werror, and the demand for one signer of each package", "kWarning": "Warnings"}
 
 # A cause of these groups need not name a broken link of the chain from the key to the entries
 # (ChainLink). reasons_problems() has the other exceptions.
