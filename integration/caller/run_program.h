@@ -29,7 +29,7 @@ enum class RunEnd {
   kExited,      // with the status `value`
   kKilled,      // by the signal `value`; if memory runs out, the tool aborts (SIGABRT)
   kTimedOut,    // and then killed
-  kNotStarted,  // `value` is the errno, or 0 if the child could not start the program
+  kNotStarted,  // no child was made: `value` is the errno; the child failed to exec: `value` is 0
   kLost,        // another thread of this process waited for the child, or SIGCHLD is ignored;
                 // `value` is the errno
 };
