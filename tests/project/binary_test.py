@@ -32,7 +32,7 @@ GOOD = {"bind": "-Wl,-z,now", "table": "-Wl,-z,relro", "place": "-pie -fPIE",
 
 # A part, the flags that remove it, and the message for a program without it.
 BAD = [("bind", "-Wl,-z,lazy", "binds its symbols when they are called"),
-       ("table", "-Wl,-z,norelro", "is writable"),
+       ("table", "-Wl,-z,norelro", "stay writable"),
        ("place", "-no-pie -fno-pie", "is not position-independent"),
        ("stack", "-fno-stack-protector", "no stack is protected"),
        ("calls", "-U_FORTIFY_SOURCE", "no call is checked"),
