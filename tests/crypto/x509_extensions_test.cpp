@@ -71,8 +71,9 @@ TEST(X509Extensions, FlagOtherThanFfIsReadAsAnIdentifier) {
   // The parser reads the flag's byte as an identifier octet. 0x01 is the identifier octet of a
   // BOOLEAN. Each other byte below starts a long-form tag. The next octet, 04, is then the tag
   // number, and 4 is the tag number of an OCTET STRING. The parser accepts this tag in the private
-  // class (0xdf, and the usual flag 0xff) and in the universal class (0x1f). It refuses the tag in
-  // the application class (0x5f) and in the context-specific class (0x9f).
+  // class (0xdf) and in the universal class (0x1f). It refuses the tag in the application class
+  // (0x5f) and in the context-specific class (0x9f). The usual flag, 0xff, is also in the private
+  // class.
   const std::pair<uint8_t, int> cases[] = {
       {0x01, -15}, {0xdf, 0}, {0x5f, -15}, {0x9f, -15}, {0x1f, 0}};
   for (const auto& [flag, result] : cases) {

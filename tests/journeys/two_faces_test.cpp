@@ -1,6 +1,6 @@
 // Packages that the tool and other programs read differently. For example, the tool and another
-// program find different signers. As the signer's key, the simulator must present the key that the
-// tool reads. Only warnings may name the key that other programs find. The most serious warnings,
+// program find different signers. The simulator must present the key that the tool reads as the
+// signer's key. Only warnings may name the key that other programs find. The most serious warnings,
 // the alarms, are also in the line of the verdict.
 #include <gmpxx.h>
 #include <gtest/gtest.h>
@@ -78,8 +78,8 @@ Package WithAPrimeBehindTheVictimsModulus(std::string* digest) {
     const auto at = std::search(tbs.begin(), tbs.end(), modulus.begin(), modulus.end());
     return Bytes(at, at + kSize);
   };
-  // The next prime after `before` differs from `before` only in the last bytes. These bytes are in
-  // the extension.
+  // The key's modulus becomes the next prime that is greater than the number that the tool reads
+  // now. The two numbers differ only in their last bytes. These bytes are in the extension.
   const Bytes before = number_read();
   OwnKey key = {0, 0, kSize};
   mpz_import(key.modulus.get_mpz_t(), kSize, 1, 1, 0, 0, before.data());
