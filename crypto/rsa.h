@@ -2,8 +2,8 @@
 //
 // An rsa_context owns the limbs of its modulus and exponent; an rsa_local releases them. No pointer
 // to the caller's bytes is kept after a call. rsa_pkcs1_verify logs a refusal, at error priority,
-// only if it refuses the DigestInfo. Exception: a DigestInfo with the length of one for MD5 is
-// refused without a message if its prefix differs from MD5's in any byte but the algorithm's.
+// only if it refuses the DigestInfo. Exception: a DigestInfo of the length for MD5 is refused
+// without a message if a byte of its prefix other than the algorithm's byte is wrong.
 #pragma once
 
 #include <cstdint>
