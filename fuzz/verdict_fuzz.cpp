@@ -228,7 +228,7 @@ void JudgeShown(const Report& report) {
           "a line without a reason shows a key if and only if the report has a key");
   Require(digest.empty() || head.compare(key + 6, 8, digest, 0, 8) == 0,
           "the shown key is the reported key");
-  const bool is_got = all.str().find("what the kernel got") != std::string::npos;
+  const bool is_got = all.str().find("the kernel got this digest") != std::string::npos;
   Require(is_got == (report.key && report.key->was_got),
           "the text says whether the kernel got the key");
   const bool is_alarmed = HasWarning(report, cause::kCertificateOtherKey);

@@ -171,7 +171,7 @@ Rows SignerRows(const Report& report) {
   if (!report.key) return rows;
   if (!rows.empty() && !report.signer->key.modulus_sha256.empty()) rows.pop_back();
   const char* const use =
-      report.key->was_got ? ": what the kernel got)" : ", as the tool reads it)";
+      report.key->was_got ? "; the kernel got this digest)" : ", as the tool reads it)";
   rows.emplace_back("modulus SHA-256 digest", report.key->sha256 + " (of the modulus alone" + use);
   return rows;
 }

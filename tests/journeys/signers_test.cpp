@@ -90,7 +90,7 @@ TEST(KernelsDigest, IsThatOfTheModulusAlone) {
   const ProcessResult modulus = RunProcess({"cat", Golden("apksigner-sha256-2048/digest")});
   EXPECT_EQ(LineWith(Told("apksigner-sha256-2048"), "modulus SHA-256") + "\n",
             "    modulus SHA-256 digest: " + modulus.output.substr(0, 64) +
-                " (of the modulus alone: what the kernel got)\n");
+                " (of the modulus alone; the kernel got this digest)\n");
   EXPECT_EQ(
       LineWith(Told("apksigner-newer-only", {"--verbose"}), "modulus SHA-256") + "\n",
       "    modulus SHA-256 digest: " + modulus.output.substr(0, 64) + " (of the modulus alone)\n");

@@ -1,7 +1,7 @@
 // Packages that the tool and other programs read differently. For example, the tool and another
-// program find different signers. The simulator must present the key that the tool reads as the
-// signer's key. Only warnings may name the key that other programs find. The most serious warnings,
-// the alarms, are also in the line of the verdict.
+// program find different signers. The signer's key in the report must be the key that the tool
+// reads. Only warnings may name the key that other programs find. The most serious warnings, the
+// alarms, are also in the line of the verdict.
 #include <gmpxx.h>
 #include <gtest/gtest.h>
 #include <openssl/mem.h>
@@ -169,7 +169,7 @@ void ExpectKey(const Told& told, const std::string& digest) {
   EXPECT_EQ(told.verdict["payload"], "2000" + digest);
   EXPECT_EQ(told.verdict["signers"][0]["modulus_sha256"], digest);
   EXPECT_TRUE(Has(told.head, "key " + Shortened(digest))) << told.head;
-  const std::string row = digest + " (of the modulus alone: what the kernel got)";
+  const std::string row = digest + " (of the modulus alone; the kernel got this digest)";
   EXPECT_TRUE(Has(told.text, "modulus SHA-256 digest: " + row)) << told.text;
   EXPECT_TRUE(Has(told.page, "<dd>" + row)) << told.page;
 }

@@ -261,7 +261,7 @@ TEST(Page, ShowsTheKernelsKeyOnlyForTheJarSigner) {
   report.signer = certificate;
   report.key = {std::string(64, '1'), 2048, true};
   const std::string page = PageOf(report);
-  EXPECT_TRUE(Has(page, "1 (of the modulus alone: what the kernel got)</dd>"));
+  EXPECT_TRUE(Has(page, "1 (of the modulus alone; the kernel got this digest)</dd>"));
   EXPECT_FALSE(Has(page, "0 (of the modulus alone"));
 }
 

@@ -106,7 +106,7 @@ TEST(ReportText, SignerIsPrintedAsApksignerPrintsIt) {
                 "    modulus SHA-256 digest: 98302ce8" +
                 std::string(50, '0') +
                 "f64646"
-                " (of the modulus alone: what the kernel got)\n"
+                " (of the modulus alone; the kernel got this digest)\n"
                 "    schemes: v1, v2\n"
                 "    protects: 2 entries (100 bytes) verified, 0 entries (0 bytes) listed and not "
                 "verified, 1 entry (1 byte) not listed\n");

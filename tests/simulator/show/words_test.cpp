@@ -126,7 +126,7 @@ TEST(HeadFacts, ShowTheInstallersReasonIfItDecidesTheVerdict) {
   EXPECT_EQ(HeadFacts(report, "..."), Lines({"phones do not install it: why"}));
 }
 
-// The first line alone must show that a signer whom --signer does not name has signed.
+// The first line alone must show that the signer is not one of those that --signer names.
 TEST(HeadFacts, HaveASignerWhoWasNotExpectedBesideAnyReason) {
   Report report = WithSigner();
   report.verdict = Verdict::kPartlySigned;
@@ -170,11 +170,11 @@ TEST(SignerRows, SayWhetherTheKernelGotTheKey) {
   EXPECT_EQ(SignerRows(report).size(), 6U);
   EXPECT_EQ(SignerRows(report)[5],
             Rows::value_type("modulus SHA-256 digest",
-                             "98302ce8 (of the modulus alone: what the kernel got)"));
+                             "98302ce8 (of the modulus alone; the kernel got this digest)"));
   report.key->was_got = false;
   EXPECT_EQ(SignerRows(report)[5].second, "98302ce8 (of the modulus alone, as the tool reads it)");
-  // The certificate is shown even if the crypto library cannot read its key. The kernel's key is
-  // shown even if the certificate is missing.
+  // The certificate is shown even if the crypto library cannot read its key. The key in
+  // `report.key` is shown even if the certificate is missing.
   report.signer->key = {"RSA", 0, "spki", ""};
   EXPECT_EQ(SignerRows(report).size(), 5U);
   EXPECT_EQ(SignerRows(report)[3].first, "public key SHA-256 digest");
