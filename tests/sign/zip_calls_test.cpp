@@ -17,7 +17,7 @@ using ApkTools::Apk;
 
 namespace {
 
-constexpr int32_t kInvalidHandle = -4;  // the zip library's code
+constexpr int32_t kInvalidHandle = -4;  // an error code of the zip library
 
 struct ZipCalls {
   std::vector<bool> ownership;       // for each opening: true if the archive owns its descriptor

@@ -1,6 +1,6 @@
-// The exit status of apktoolkit-sim, and the messages that belong to it. In most tests, the probe
-// (tests/simulator/phone/probe.cpp) takes the place of the tool, and executes the commands that the
-// test lists.
+// Tests each exit status of apktoolkit-sim, and the messages that belong to this status. In most
+// tests, the probe (tests/simulator/phone/probe.cpp) takes the place of the tool, and executes the
+// commands that the test lists.
 #include <gtest/gtest.h>
 #include <sys/stat.h>
 #include <unistd.h>
@@ -136,7 +136,8 @@ TEST(ExitStatus, IsThreeWhenTheToolIsMissing) {
 }
 
 TEST(ExitStatus, IsThreeWhenTheToolIsNotAProgram) {
-  if (AreProgramsEmulated()) GTEST_SKIP() << "the emulator starts, and not the tool";
+  if (AreProgramsEmulated())
+    GTEST_SKIP() << "the emulator starts even if the tool is not a program";
   const TempDir directory;
   const std::string tool = directory.WriteProgram("tool", "\177ELF");
   const ProcessResult result = RunProcess({SimulatorPath(), "--tool", tool, "/"});
@@ -147,9 +148,9 @@ TEST(ExitStatus, IsThreeWhenTheToolIsNotAProgram) {
 TEST(ExitStatus, IsThreeWhenRunnerIsMissingOrStandInsAreNotLoaded) {
   if (AreProgramsEmulated()) GTEST_SKIP() << "the emulator hides that a program does not start";
   const TempDir directory;
-  // This tool is a script that starts `true` without LD_PRELOAD, so the simulator's libraries (the
-  // stand-ins) are not loaded.
-  const std::string tool = directory.WriteProgram("tool", "#!/usr/bin/env -S -u LD_PRELOAD true\n");
+  // No run starts this tool: the first runner does not exist, and the second runner (`true`)
+  // ignores its arguments. The simulator's libraries (the stand-ins) are therefore not loaded.
+  const std::string tool = directory.WriteProgram("tool", "#!/bin/true\n");
   const ProcessResult result =
       RunProcess({SimulatorPath(), "--runner", "/nowhere/emulator", "--tool", tool, "/"});
   EXPECT_EQ(result.status, 3);
@@ -209,8 +210,8 @@ TEST(ExitStatus, IsThreeWhenThePageIsAPipeThatNobodyReads) {
   EXPECT_EQ(read.output.substr(read.output.size() - 8), "</html>\n");
 }
 
-// The fault is in the file system and not in the package, so the package is not refused. Its
-// verdict is NOT SIMULATED.
+// The file size limit (ulimit -f) makes the write of the library fail. The package is not at fault,
+// so its verdict is NOT SIMULATED and not REFUSED.
 TEST(ExitStatus, IsThreeWhenLibrariesCannotBeWritten) {
   const TempDir directory;
   const std::string file = directory / "base.apk";
@@ -278,7 +279,7 @@ TEST(ExitStatus, IsTwoWhenATrustedFileOrTheToolWouldBeReplaced) {
   const TempDir directory;
   const Probe probe({"sign 3 0000"});
   // Each file begins like an earlier output of apktoolkit-sim, which a new output may replace. The
-  // run refuses to replace these files only because they are its inputs.
+  // run refuses to replace these files. The only reason is that they are inputs of this run.
   const std::string journal = directory.Write("journal", ToBytes("{\"event\":\"journal\"}\n"));
   const std::string page =
       directory.Write("page", ToBytes("<!DOCTYPE html>\n<!-- A page of apktoolkit-sim -->\n"));

@@ -13,7 +13,7 @@ using namespace simulator;
 
 namespace {
 
-// The options after the arguments `words` are parsed. The arguments must be valid.
+// Parses the arguments `words`, which must be valid. Returns the options.
 Options Parsed(Lines words) {
   Options options;
   words.insert(words.begin(), "apktoolkit-sim");

@@ -1,5 +1,5 @@
-// Runs apktoolkit-sim. The simulated tool is apktoolkit, or the probe
-// (tests/simulator/phone/probe.cpp), which executes a test's commands.
+// Runs apktoolkit-sim, with apktoolkit or with the probe (tests/simulator/phone/probe.cpp) as the
+// tool. The probe executes a test's commands.
 #pragma once
 
 #include <algorithm>

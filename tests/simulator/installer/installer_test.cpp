@@ -82,7 +82,7 @@ TEST(InstallerProcess, IsNotStartedWhenItIsOff) {
   EXPECT_NE(RunProcess({"test", "-e", java / "started"}).status, 0);
 }
 
-// The process for the first package ends. A new process answers for the second package.
+// The first process ends without an answer. The second call of Judge() starts a new process.
 TEST(InstallerProcess, IsStartedAgainWhenItEnds) {
   const FakeJava java(
       "if [[ ! -e $0.was ]]; then touch \"$0.was\"; read -r path; exit 1; fi\n"

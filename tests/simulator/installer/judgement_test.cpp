@@ -10,8 +10,8 @@ namespace {
 
 std::string Hexadecimal(const Bytes& bytes) { return Hex(bytes); }
 
-// An answer with one range of API levels. The range's members "verified", "signers" and "errors"
-// have these values.
+// An answer with one range of API levels. Each parameter is the JSON value of the range's member
+// with the parameter's name.
 std::string Answer(const std::string& verified, const std::string& signers,
                    const std::string& errors) {
   return R"({"ranges":[{"first":27,"last":2147483647,"verified":)" + verified +
@@ -23,7 +23,8 @@ const std::string kSigner =
     R"([{"scheme":"v2","certificate":")" + Hexadecimal(Certificate().Build()) + R"("}])";
 constexpr char kError[] = R"([{"issue":"A_FAULT","parameters":["a","b"],"text":"a b"}])";
 
-// An answer with two ranges. Each parameter is the first and the last level of a range.
+// An answer with two ranges. Each parameter is the JSON text of one range's members "first" and
+// "last".
 std::string AnswerFor(const std::string& first, const std::string& second) {
   const auto range = [](const std::string& levels) {
     return "{" + levels + R"(,"verified":false,"schemes":[],"signers":[],"errors":)" + kError +

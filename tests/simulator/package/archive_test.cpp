@@ -190,7 +190,8 @@ TEST(ArchiveEnd, IsTheLastMarkThatHasRoomForARecord) {
   EXPECT_EQ(end_of(""), 1);
   EXPECT_EQ(end_of("a comment"), 1);
   EXPECT_EQ(end_of(std::string(65535, 'c')), 1);
-  // The end record's signature, PK\5\6, does not count here: one byte too few for a record follows.
+  // The end record's signature, PK\5\6, does not count here: only 17 bytes follow it, and a
+  // record has 18 bytes after its signature.
   EXPECT_EQ(end_of(std::string("PK\5\6") + std::string(17, '\0')), 1);
   // Here the signature begins a whole record, so it counts, as in the platform's library.
   EXPECT_EQ(end_of(std::string("PK\5\6") + std::string(18, '\0')), 0);

@@ -123,8 +123,8 @@ TEST(KernelVerify, RefusesWithTheErrorOfThePhone) {
 }
 
 TEST(KernelFcntl, OtherCommandsGoToTheRealKernel) {
-  // The feature's own commands are 1124 and 1125. The commands below are 1123 and 1126, an unknown
-  // command, a command for a descriptor that is not open, and commands that the real kernel knows.
+  // The commands of the file-integrity feature are 1124 and 1125. The real kernel does not know the
+  // commands 1123, 1126 and 99999, but knows the F_ commands. Descriptor 700 is not open.
   const Lines commands = {"fcntl 3 1123 0",
                           "fcntl 3 1126 0",
                           "fcntl64 3 1123 0",

@@ -109,7 +109,7 @@ long Limit(const Words& words) {
 
 std::string g_file;
 
-// For tests that check whether this process has ended.
+// Tests wait until FILE.pid is not empty. Some tests later check that this process has ended.
 long WriteId(const Words&) {
   std::ofstream(g_file + ".pid") << getpid() << std::endl;
   return 0;

@@ -54,7 +54,7 @@ TEST(PhoneEnvironment, EverySettingArrives) {
   EXPECT_EQ(phone.zu_result, -3);
 }
 
-// A text without an inode number becomes {0, 0}. No file has the inode 0.
+// The list item "5" has no inode number, and becomes {0, 0}. No file has the inode 0.
 TEST(PhoneEnvironment, TrustedFileWithoutAnInodeIsReadAsZero) {
   const Environment environment({"APKTOOLKIT_SIM_TRUST=5,6:7"});
   EXPECT_EQ(SettingsFromEnvironment().trusted, std::vector<FileId>({{0, 0}, {6, 7}}));

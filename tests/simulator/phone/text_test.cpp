@@ -26,8 +26,8 @@ TEST(JournalText, QuotesBackslashesAndControlsAreEscaped) {
 }
 
 TEST(JournalText, Utf8StaysAsItIs) {
-  // The first and the last character of two, of three and of four bytes for which IsHidden is
-  // false. Also the characters next to the surrogates, and next to U+F780 to U+F7FF.
+  // For each length from two to four bytes, the list has the first and the last character that is
+  // not hidden (IsHidden). The list has all neighbours of the surrogates and of U+F780 to U+F7FF.
   for (const std::string text : {"\u00a0", "\u07ff", "\u0800", "\ud7ff", "\ue000", "\ufffd",
                                  "\U00010000", "\U0010ffff", "\uf77f", "\uf800"}) {
     EXPECT_EQ(EncodeText(text), "\"" + text + "\"");

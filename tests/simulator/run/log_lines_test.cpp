@@ -103,7 +103,8 @@ TEST(ToolLogLine, TextThatWasCutIsKnownByItsStart) {
   EXPECT_EQ(ReadLogLine(std::string(1023, 'x')).meaning, LogMeaning::kUnknown);
 }
 
-// The number that this text captures comes after the file's name, which fills the rest of the text.
+// In this log text, the captured number comes after the file's name. The log cuts the text inside
+// the name, so the number is lost.
 TEST(ToolLogLine, LaterConversionOfACutTextIsNotCaptured) {
   const std::string start = "OpenArchiveFd(12) [file: ";
   const LogLine line = ReadLogLine(start + std::string(1023 - start.size(), 'x'));

@@ -152,7 +152,8 @@ TEST(CommonDirectory, EndsAtASlashThatAllHave) {
   EXPECT_EQ(CommonDirectory({"a/bc", "a/bd"}), "a/");
   EXPECT_EQ(CommonDirectory({"a/b", "a/b/c"}), "a/");
   EXPECT_EQ(CommonDirectory({"a/b/c", "a/b/d", "x"}), "");
-  EXPECT_EQ(CommonDirectory({"/a", "/b"}), "") << "a directory / would shorten no path";
+  EXPECT_EQ(CommonDirectory({"/a", "/b"}), "")
+      << "the root directory is not shown as the common directory";
   EXPECT_EQ(CommonDirectory({"a/b", "a/b"}), "a/");
   EXPECT_EQ(CommonDirectory({"a/", "a/"}), "") << "each path keeps a part after the directory";
   EXPECT_EQ(CommonDirectory({"", "a/b"}), "");
