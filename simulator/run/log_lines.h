@@ -60,7 +60,7 @@ enum class LogMeaning {
 struct LogLine {
   LogMeaning meaning = LogMeaning::kUnknown;
   std::string whole;   // without its line end
-  std::string text;    // the captured part; empty if there is none, or if the log cut it off
+  std::string text;    // the captured part; empty if the meaning has none, or if the log cut it off
   int64_t number = 0;  // `text` as a number; 0 if `text` is not a number or was cut
 };
 

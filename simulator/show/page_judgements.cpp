@@ -16,8 +16,8 @@ using kainjow::mustache::list;
 using kainjow::mustache::object;
 
 // A row of the table. It shows the tool's judgement, or the judgement of phones with certain API
-// levels, or that there is no judgement of phones. Each text of `signers` and `why` becomes a line
-// of its cell.
+// levels, or that phones gave no judgement. Each text of `signers` and `why` becomes a line of its
+// cell.
 struct Said {
   std::string who;
   Mark mark;

@@ -1,8 +1,8 @@
 #!/usr/bin/env python3
 """add_v3.py APK CERTIFICATE KEY FIRST LAST [ID]: adds a signature to the signing block of the package
-APK, and keeps the block's other signatures. Makes the block if there is none. The signature is a v3
-signature for phones of the API levels FIRST to LAST. With ID (hexadecimal), the signature
-gets this ID in the block, but keeps the form of a v3 signature. openssl makes the signature."""
+APK, and keeps the block's other signatures. Makes the block if APK has none. The signature is a v3
+signature for phones of the API levels FIRST to LAST. With ID (hexadecimal), the signature gets this
+ID in the block, but keeps the form of a v3 signature. openssl makes the signature."""
 
 import hashlib
 import struct

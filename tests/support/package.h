@@ -50,7 +50,7 @@ class Package {
  public:
   std::vector<ZipItem> items;
 
-  // The first entry of this name. Aborts if there is no such entry.
+  // The first entry of this name. Aborts if the package lacks this entry.
   ZipItem& Item(const std::string& name);
   void Remove(const std::string& name);
   // Flips one bit in the middle of the entry's data, after signing.
