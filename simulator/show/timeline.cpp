@@ -1,8 +1,8 @@
 #include "simulator/show/timeline.h"
 
 #include <algorithm>
-#include <cstdio>
-#include <cstring>
+#include <iomanip>
+#include <sstream>
 
 #include "sign/libzu.h"
 
@@ -127,13 +127,17 @@ std::string WithoutEnd(std::string text) {
   return text;
 }
 
+// An event of an unknown kind can have a name of any length. The line shows the whole name.
 void PrintLine(int number, const Line& line, const Look& look, std::ostream& out) {
-  char head[64];
-  snprintf(head, sizeof(head), "%4d  %-9s  ", number, Printable(line.what, look).c_str());
+  constexpr size_t kWhatColumns = 9;
+  const std::string what = Printable(line.what, look);
+  const size_t missing = kWhatColumns - std::min(Columns(what), kWhatColumns);
+  std::ostringstream head;
+  head << std::setw(4) << number << "  " << what << std::string(missing + 2, ' ');
   const Colour colour = line.is_failure ? Colour::kRed : Colour::kPlain;
-  out << Coloured(head + Printable(line.text, look), colour, look) << '\n';
+  out << Coloured(head.str() + Printable(line.text, look), colour, look) << '\n';
   if (line.detail.empty()) return;
-  out << std::string(strlen(head), ' ') << Printable(line.detail, look) << '\n';
+  out << std::string(Columns(head.str()), ' ') << Printable(line.detail, look) << '\n';
 }
 
 }  // namespace

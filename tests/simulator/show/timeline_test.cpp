@@ -145,3 +145,10 @@ TEST(Timeline, ControlCharactersOfAnUnknownEventAreEscaped) {
   EXPECT_EQ(LinesOf(Printed(kStart + "{\"event\":\"\\u001b\\uf7e9\"}\n" + kExit))[0],
             "   1  \\x1b\\xe9   {\"event\":\"\\u001b\uf7e9\"}");
 }
+
+// The line once was cut inside the "é", which left a byte that is not UTF-8.
+TEST(Timeline, LongNameOfAnUnknownEventIsShownWhole) {
+  const std::string name = std::string(56, 'a') + "éb";
+  EXPECT_EQ(LinesOf(Printed("{\"event\":\"" + name + "\"}\n"))[0],
+            "   1  " + name + "  {\"event\":\"" + name + "\"}");
+}
