@@ -15,9 +15,10 @@ import java.util.LinkedHashSet;
 import java.util.Set;
 
 /**
- * Lists the package manager's current RSA signers of a package. Each signer is shown as the SHA-256
- * digest of the key's modulus. For the JAR signer's key, apktoolkit computes the digest in the same
- * way and passes it to the kernel. Use this class in the process that installs packages.
+ * Lists the current RSA signers of a package, as the package manager knows them. Each signer is
+ * shown as the SHA-256 digest of the key's modulus. For the JAR signer's key, apktoolkit computes
+ * the digest in the same way and passes it to the kernel. Use this class in the process that
+ * installs packages.
  *
  * <p>Of a package's signature schemes, the package manager uses the newest one that it knows.
  * apktoolkit uses the JAR signature, whose signer can be a different one. Pass a package to

@@ -68,8 +68,9 @@ void PageTable::Fill(data* page) const {
   page->set("choice", OneIf(choices.size() > 1));
 }
 
-// Returns the reader's choices of rows. Each verdict in the table is one choice, the worst first.
-// If some files have warnings, the last choice has the rows of these files.
+// Returns the choices that the page offers to its reader. A choice selects the rows that
+// the page shows. Each verdict in the table is one choice, the worst first. If some files have
+// warnings, the last choice selects the rows of these files.
 list PageTable::Choices() const {
   const auto count = [this](const auto& is_chosen) {
     return static_cast<size_t>(std::count_if(rows_.begin(), rows_.end(), is_chosen));

@@ -64,8 +64,9 @@ def half_digit_is_quotient_and_remainder():
     function = load("crypto/mpi.cpp", "half_digit")
     given = [z3.UGE(d.term, 1 << 31), z3.ULT(rest.term, d.term), z3.ULE(half.term, HALF)]
     high, low = d >> 16, d & HALF
-    # `taken` is estimate * high, and `to_take` is estimate * low. `rest` is taken + left. `rest` is
-    # below (2^16 + 2) * high, so the estimate is below 2^16 + 2, and `to_take` fits in a limb.
+    # `estimate` is the quotient of `rest` and `high`, and `left` is the remainder. `taken` is
+    # estimate * high, and `to_take` is estimate * low. `rest` is below (2^16 + 2) * high, so
+    # `estimate` is below 2^16 + 2. `low` is below 2^16, so `to_take` fits in a limb.
     estimate, left, taken, to_take = word("estimate"), word("left"), word("taken"), word("to_take")
     always(given, z3.UGT(wide(high) * (HALF + 3), wide(rest)))
     given += [z3.ULE(estimate.term, HALF + 2), z3.ULT(left.term, high.term),
@@ -99,7 +100,7 @@ def half_digit_is_quotient_and_remainder():
     always(given, z3.ULT((wide(rest) << 16) + wide(half), wide(d) << 16))
 
 
-def plain_text_is_eight_bytes_above_the_line_ends():
+def eight_bytes_are_plain_text_if_each_is_greater_than_cr():
     eight = word("eight", 64)
     function = load("apk/manifest_mf.cpp", "IsPlainText")
     expected = z3.And(*(z3.UGT(z3.Extract(8 * i + 7, 8 * i, eight.term), ord("\r"))
@@ -184,7 +185,7 @@ def line_outside_the_dialect_is_named():
 PROOFS = (line_outside_the_dialect_is_named,
           multiply_add_equals_the_wide_product_plus_both_addends,
           half_digit_is_quotient_and_remainder,
-          plain_text_is_eight_bytes_above_the_line_ends,
+          eight_bytes_are_plain_text_if_each_is_greater_than_cr,
           windows_make_up_the_exponent,
           no_limb_is_held_in_anything_wider)
 
