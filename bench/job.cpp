@@ -19,7 +19,7 @@ namespace {
 
 std::string AttributeText(const android::ResXMLParser& parser, const char* name);
 void ReadWhole(const std::string& path, Buffer& out);
-void AskKernel(int fd);
+void LogUnsigned();
 
 }  // namespace
 
@@ -95,7 +95,7 @@ void SignLibraries(const GivenPackage& package, const CheckLibrary& check) {
     ReadWhole(path, content);
     check(name, content);
     const int fd = open(path.c_str(), O_RDONLY);
-    AskKernel(fd);
+    LogUnsigned();
     close(fd);
   }
   EndIteration(cookie);
@@ -104,7 +104,7 @@ void SignLibraries(const GivenPackage& package, const CheckLibrary& check) {
 
 void SignGiven(const GivenPackage& package) {
   LogInfo("VeltSign starts: zip_fd = %d, fd = %d.\n", package.fd, package.fd);
-  AskKernel(package.fd);
+  LogUnsigned();
   LogInfo("VeltSign finished: %u.\n", 0x10000U);
 }
 
@@ -138,7 +138,7 @@ void ReadWhole(const std::string& path, Buffer& out) {
 
 // Logs the lines that the tool logs on a workstation. The kernel there has no integrity file, so
 // the tool sends no request.
-void AskKernel(int /*fd*/) {
+void LogUnsigned() {
   LogInfo("VeltSignOat: Apk case.\n");
   FILE* const integrity = fopen("/proc/self/integrity/value", "r");
   if (integrity != nullptr) GiveUp("this kernel has the integrity feature");

@@ -56,10 +56,10 @@ Judgement Installer::Judge(const std::string& file) {
 }
 
 Judgement Installer::Ask(const std::string& path) {
-  if (!pipe_ && !Start()) return GaveUp("java does not start");
+  if (!socket_ && !Start()) return GaveUp("java does not start");
   const Deadline deadline(options_.timeout);
   std::string answer;
-  if (Send(pipe_->get(), path + "\n") && Receive(pipe_->get(), deadline, &answer)) {
+  if (Send(socket_->get(), path + "\n") && Receive(socket_->get(), deadline, &answer)) {
     return ParseJudgement(answer);
   }
   Stop();  // the next package starts a new process
@@ -75,7 +75,7 @@ bool Installer::Start() {
   int ends[2];
   if (socketpair(AF_UNIX, SOCK_STREAM | SOCK_CLOEXEC, 0, ends) != 0) return false;
   const ScopedFd theirs(ends[1]);
-  pipe_.emplace(ends[0]);
+  socket_.emplace(ends[0]);
   std::string words[] = {"java",
                          "-Xmx512m",  // limits the heap, even for a hostile package
                          "-XX:+UseSerialGC",
@@ -98,13 +98,13 @@ bool Installer::Start() {
   const int error =
       posix_spawnp(&process_, arguments[0], &actions, group.get(), arguments, environ);
   posix_spawn_file_actions_destroy(&actions);
-  if (error != 0) pipe_.reset();
+  if (error != 0) socket_.reset();
   return error == 0;
 }
 
 void Installer::Stop() {
-  if (!pipe_) return;
-  pipe_.reset();
+  if (!socket_) return;
+  socket_.reset();
   kill(process_, SIGKILL);
   waitpid(process_, nullptr, 0);
 }
@@ -142,12 +142,12 @@ bool Send(int fd, std::string_view bytes) {
 // Receives one line, without its line feed. Returns false if the deadline passes first, if about
 // kLongest bytes contain no line feed, or if the Java program ends first.
 bool Receive(int fd, const Deadline& deadline, std::string* line) {
-  constexpr int kNowAndThen = 100;  // milliseconds
+  constexpr int kPollMilliseconds = 100;
   constexpr size_t kLongest = 64 << 20;
   std::string part(1 << 16, '\0');
   while (line->size() < kLongest && !deadline.HasPassed()) {
     pollfd waiting = {fd, POLLIN, 0};
-    if (poll(&waiting, 1, kNowAndThen) <= 0) continue;
+    if (poll(&waiting, 1, kPollMilliseconds) <= 0) continue;
     // Judge holds mutex_ during this wait on purpose: packages are judged one after the other.
     // NOLINTNEXTLINE(clang-analyzer-unix.BlockInCriticalSection)
     const ssize_t size = recv(fd, part.data(), part.size(), 0);

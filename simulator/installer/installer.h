@@ -51,8 +51,8 @@ class Installer {
   void Stop();
 
   const InstallerOptions& options_;
-  std::mutex mutex_;              // protects the members below
-  std::optional<ScopedFd> pipe_;  // for both directions; none: the process does not run
+  std::mutex mutex_;                // protects the members below
+  std::optional<ScopedFd> socket_;  // for both directions; none: the process does not run
   pid_t process_ = -1;
 };
 

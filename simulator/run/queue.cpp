@@ -15,7 +15,7 @@ void RunInOrder(size_t count, unsigned jobs, const std::function<void(size_t num
                 const std::function<void(size_t number)>& done,
                 const std::function<void(size_t number, int seconds)>& waiting) {
   using Clock = std::chrono::steady_clock;
-  constexpr auto kNowAndThen = std::chrono::milliseconds(200);
+  constexpr auto kUpdateInterval = std::chrono::milliseconds(200);
   std::mutex mutex;  // protects `next` and `has_run`
   std::condition_variable finished;
   size_t next = 0;  // the first number that no thread has taken yet
@@ -38,7 +38,7 @@ void RunInOrder(size_t count, unsigned jobs, const std::function<void(size_t num
     std::unique_lock<std::mutex> lock(mutex);
     const auto is_never_run = [&] { return IsInterrupted() && i >= next; };
     while (!has_run[i] && !is_never_run()) {
-      finished.wait_for(lock, kNowAndThen);
+      finished.wait_for(lock, kUpdateInterval);
       const auto passed = std::chrono::duration_cast<std::chrono::seconds>(Clock::now() - start);
       if (has_run[i] || passed.count() == 0) continue;
       lock.unlock();
