@@ -41,7 +41,8 @@ std::string Grouped(uint64_t number);
 //   NAME_shown  a section that is shown if there are lines
 //   NAME        the fields that `make` returns, for each of the first kMostPageLines lines
 //   NAME_count  the number of all lines
-//   NAME_more   a section that is shown if lines are left out: their number, and then `remark`
+//   NAME_more   a section with the number of lines that are left out, and then `remark`. It is
+//               shown only if lines are left out.
 template <typename Lines, typename Make>
 void AddLines(const std::string& name, const Lines& lines, const std::string& remark, Make make,
               kainjow::mustache::data* file) {

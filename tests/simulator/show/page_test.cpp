@@ -202,7 +202,7 @@ TEST(Page, HasATableOfFilesWhereThereAreSeveral) {
 TEST(Page, LeavesOutEmptySections) {
   const std::string page = PageOf(Example(Verdict::kNotLookedAt));
   EXPECT_TRUE(Has(page, "NOT LOOKED AT"));
-  EXPECT_EQ(Count(page, "<h3>"), 1U) << "the file and the run alone";
+  EXPECT_EQ(Count(page, "<h3>"), 1U) << "only the section on the file and the run";
   for (const char* part : {"<svg class=\"bar\"", "<ol", "<table", "SHA-256", "size (bytes)"}) {
     EXPECT_FALSE(Has(page, part)) << part;
   }
