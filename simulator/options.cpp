@@ -330,7 +330,7 @@ void AddRun(CLI::App* app, Options* options, std::string* runner) {
 
 // With --verify, nothing is signed, and there are no registrations and no verdicts. --verify
 // therefore excludes the options about signing, registrations and verdicts. It also excludes
-// --recursive.
+// --recursive, which finds only packages and would leave out the native libraries beside them.
 void AddVerify(CLI::App* app, Options* options) {
   CLI::Option* const verify = app->add_flag("--verify", options->verify,
                                             "Sign nothing. Run the apktoolkit-verify beside\n"

@@ -152,9 +152,9 @@ inline constexpr Cause kPackageWithoutManifest = {"package-without-manifest", Gr
     "Build the package again with aapt or aapt2, which put AndroidManifest.xml in it."};
 inline constexpr Cause kJarNotTrusted = {"jar-not-trusted", Group::kFile, Severity::kRefused,
     ChainLink::kKey, "`VELT can't verify a file`",
-    "it is a plain JAR, which is signed only if the kernel already trusts it (%s)",
-    "Nothing to do, unless the JAR should have come from a trusted image. Here --trust makes the "
-    "kernel trust it."};
+    "it is a plain JAR, which is signed only if the kernel already trusts it; the kernel answered "
+    "%s", "Nothing to do, unless the JAR should have come from a trusted image. Here --trust makes "
+    "the kernel trust it."};
 inline constexpr Cause kAndroidManifestDamaged = {"android-manifest-damaged", Group::kFile,
     Severity::kRefused, ChainLink::kKey, "`Can't extract Android Manifest`", "its "
     "AndroidManifest.xml cannot be extracted, so it counts as a plain JAR, which the kernel does "
@@ -440,7 +440,7 @@ inline constexpr Cause kForgeableKey = {"forgeable-key", Group::kWarning, Severi
     ChainLink::kNone, "", "the key has the public exponent %s: anyone can make its signatures",
     "Do not trust this package. Normal keys have the exponent 65537."};
 inline constexpr Cause kEntriesChanged = {"entries-changed", Group::kWarning, Severity::kWarning,
-    ChainLink::kNone, "", "%s: different from the manifest, and the tool does not check this",
+    ChainLink::kNone, "", "%s: the content does not match the manifest; the tool does not check it",
     "Sign the package again, as the last step that changes it. If you did not build it, do not "
     "trust it."};
 inline constexpr Cause kEntriesMissing = {"entries-missing", Group::kWarning, Severity::kWarning,

@@ -392,7 +392,8 @@ TEST_F(Reason, PlainJarIsSignedOnlyIfTrusted) {
   EXPECT_EQ(Told(2, {}, "library.jar"),
             Lines({"NOT TRUSTED JAR  library.jar",
                    "  ✗ JAR  not signed: it is a plain JAR, which is signed only if the kernel "
-                   "already trusts it (ENOKEY: Required key not available)",
+                   "already trusts it; the kernel answered ENOKEY: Required key not "
+                   "available",
                    "-> 1"}));
   EXPECT_EQ(Told(2, {"--trust", "library.jar"}, "library.jar"),
             Lines({"TRUSTED JAR  library.jar", "  ✓ JAR  signed, with an empty payload", "-> 0"}));

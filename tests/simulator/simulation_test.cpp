@@ -12,8 +12,8 @@ namespace {
 
 // The text after the name of an untrusted JAR, in the line of the verdict.
 constexpr char kNotTrusted[] =
-    "   it is a plain JAR, which is signed only if the kernel already trusts it (ENOKEY: Required "
-    "key not available)";
+    "   it is a plain JAR, which is signed only if the kernel already trusts it; the kernel "
+    "answered ENOKEY: Required key not available";
 
 }  // namespace
 
