@@ -1,5 +1,6 @@
-// Some rules of the tool are lenient on purpose, or trust the file. Tests which attacks these rules
-// permit, and which attacks still fail. docs/threat-model.md gives the reasons for the rules.
+// Some rules of the tool are lenient on purpose, or trust the file. These tests show which attacks
+// the rules permit, and which attacks still fail. docs/threat-model.md gives the reasons for the
+// rules.
 #include <sys/mman.h>
 #include <sys/wait.h>
 

@@ -228,7 +228,7 @@ TEST_F(ReadFileTest, PiecewiseAndInterruptedReadsAreJoined) {
   Bytes out;
   EXPECT_TRUE(ReadFile(MakeFile("abcdefg"), out));
   EXPECT_EQ(ToBytes("abcdefg"), out);
-  // No read requests more bytes than the rest of the buffer has.
+  // Each call of read requests at most the number of bytes that are left in the buffer.
   EXPECT_EQ(std::vector<size_t>({7, 7, 5, 5, 3, 3, 1, 1}), asked);
 }
 

@@ -36,7 +36,7 @@ constexpr char kWrongHash[] = "WrongHash";
 constexpr const char* kDigests[] = {"MD5", "SHA-1", "SHA-256"};
 
 struct Counts {
-  int valid = 0, wrong_hash = 0, lenient = 0, acceptable = 0;  // vectors that verify
+  int valid = 0, wrong_hash = 0, lenient = 0, acceptable = 0;  // accepted vectors
   int refused = 0;
   // Signatures of another length than the modulus. They are not verified, because rsa_pkcs1_verify
   // always reads as many bytes as the modulus has.
