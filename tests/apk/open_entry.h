@@ -1,4 +1,4 @@
-// An open archive in memory that has one entry. `entry` is this entry as the zip library finds it.
+// An open archive with one entry, in memory. `entry` is this entry as the zip library finds it.
 #pragma once
 
 #include <gtest/gtest.h>
