@@ -16,8 +16,9 @@ constexpr useconds_t kPollMicroseconds = 10000;
 constexpr size_t kPathSize = 256;
 
 bool MaySign(uint32_t integrity) {
-  // Deliberate: a read that waits never returns the value "not settled". This check refuses that
-  // value nevertheless, so that a change to VeltTaskReadIntegrity cannot let it through.
+  // Deliberate: VeltSignFd waits until the value is settled, so `integrity` is never kNotSettled
+  // here. This check refuses kNotSettled nevertheless, so that a later change to
+  // VeltTaskReadIntegrity cannot let a task sign too early.
   return integrity != 0 && integrity != kNotSettled;
 }
 
