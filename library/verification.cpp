@@ -82,7 +82,7 @@ const char* TextOf(Reason reason) {
     case Reason::kBlockMalformed:
       return "its signature block is malformed, or its key is not an RSA key";
     case Reason::kKeyRefused:
-      return "its key ends beyond the signature block, or its public exponent is 1 or -1";
+      return "its key is not whole in the signature block, or has the public exponent 1 or -1";
     case Reason::kCertificateRefused:
       return "its certificate is not signed with its own key";
     case Reason::kSignatureRefused:
