@@ -31,6 +31,8 @@ bool EntryDigests::Load(std::vector<uint8_t> text) {
 }
 
 void EntryDigests::List() {
+  sections_.clear();
+  hashes_.clear();
   const ManifestMf::Sections& sections = manifest_mf_.getSections();
   sections_.reserve(sections.size());
   std::string_view last;

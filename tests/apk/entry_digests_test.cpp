@@ -178,6 +178,20 @@ TEST(EntryDigests, EntriesAreFoundOnlyAfterListIsCalled) {
   EXPECT_TRUE(digests.Find("a", digest_name, digest));
 }
 
+// The names are in byte order, and then not.
+TEST(EntryDigests, SecondCallOfListChangesNothing) {
+  const std::string a = Section("a", "1"), b = Section("b", "2"), c = Section("c", "3");
+  for (const std::string& text : {a + b + c, c + a + b}) {
+    EntryDigests digests;
+    ASSERT_TRUE(digests.Load({text.begin(), text.end()}));
+    digests.List();
+    digests.List();
+    EXPECT_EQ("SHA-256-Digest 1", Found(digests, "a"));
+    EXPECT_EQ("SHA-256-Digest 2", Found(digests, "b"));
+    EXPECT_EQ("SHA-256-Digest 3", Found(digests, "c"));
+  }
+}
+
 // Nothing is left of the first manifest, even if the second one does not parse.
 TEST(EntryDigests, LoadingAnotherManifestForgetsTheFirst) {
   LogCapture log;
