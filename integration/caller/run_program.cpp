@@ -1,19 +1,22 @@
 #include "integration/caller/run_program.h"
 
+#include <dirent.h>
 #include <fcntl.h>
 #include <signal.h>
 #include <sys/resource.h>
+#include <sys/syscall.h>
 #include <sys/wait.h>
 #include <time.h>
 #include <unistd.h>
 
 #include <algorithm>
 #include <cerrno>
+#include <cstdlib>
 
 namespace {
 
-// The exit status of a child that could not set its memory limit or exec the program. The tool,
-// apktoolkit-verify and apktoolkit-bound end with lower statuses.
+// The exit status of a child that could not close its descriptors, set its memory limit or exec the
+// program. The tool, apktoolkit-verify and apktoolkit-bound end with lower statuses.
 constexpr int kCannotBecome = 127;
 
 // Everything that the child needs. It is made before the fork, because the child must not allocate
@@ -22,13 +25,13 @@ constexpr int kCannotBecome = 127;
 struct Child {
   std::vector<char*> arguments;  // ends with a null pointer
   int null;                      // /dev/null, with a descriptor above those of the standard streams
-  int descriptors;               // the child closes each descriptor from 3 to this number - 1
   rlim_t memory_bytes;
 };
 
 std::vector<char*> Arguments(const std::vector<std::string>& command);
 int OpenNull();
 [[noreturn]] void Become(const Child& child);
+bool CloseOtherDescriptors();
 RunResult Wait(pid_t child, int milliseconds);
 RunResult Kill(pid_t child);
 RunResult Describe(int status);
@@ -38,8 +41,7 @@ void Sleep(long long milliseconds);
 }  // namespace
 
 RunResult RunProgram(const std::vector<std::string>& command, const RunLimits& limits) {
-  const Child child = {Arguments(command), OpenNull(), static_cast<int>(sysconf(_SC_OPEN_MAX)),
-                       limits.memory_bytes};
+  const Child child = {Arguments(command), OpenNull(), limits.memory_bytes};
   if (child.null < 0) return {RunEnd::kNotStarted, errno};
   const pid_t pid = fork();
   const int error = errno;
@@ -75,7 +77,7 @@ int OpenNull() {
 // The standard streams must be open: the tool refuses a file that gets descriptor 0.
 void Become(const Child& child) {
   for (const int stream : {STDIN_FILENO, STDOUT_FILENO, STDERR_FILENO}) dup2(child.null, stream);
-  for (int fd = STDERR_FILENO + 1; fd < child.descriptors; ++fd) close(fd);
+  if (!CloseOtherDescriptors()) _exit(kCannotBecome);
   const rlimit memory = {child.memory_bytes, child.memory_bytes};
   if (child.memory_bytes != 0 && setrlimit(RLIMIT_DATA, &memory) != 0) _exit(kCannotBecome);
   sigset_t none;
@@ -83,6 +85,27 @@ void Become(const Child& child) {
   sigprocmask(SIG_SETMASK, &none, nullptr);
   execv(child.arguments[0], child.arguments.data());
   _exit(kCannotBecome);
+}
+
+// Closes every descriptor except the standard streams, and returns true for success. A loop up to
+// the limit of descriptors would miss descriptors that were opened before the limit was lowered,
+// and takes long if the limit is very high. The system call getdents64 is used, because opendir
+// allocates memory.
+bool CloseOtherDescriptors() {
+  const int directory = open("/proc/self/fd", O_RDONLY | O_DIRECTORY);
+  if (directory < 0) return false;
+  alignas(dirent64) char entries[4096];
+  long size = 0;
+  while ((size = syscall(SYS_getdents64, directory, entries, sizeof entries)) > 0) {
+    for (long i = 0; i < size;) {
+      const auto* const entry = reinterpret_cast<const dirent64*>(entries + i);
+      const int fd = atoi(entry->d_name);  // 0 for "." and ".."
+      if (fd > STDERR_FILENO && fd != directory) close(fd);
+      i += entry->d_reclen;
+    }
+  }
+  close(directory);
+  return size == 0;
 }
 
 RunResult Wait(pid_t child, int milliseconds) {

@@ -1,6 +1,6 @@
 // Runs a program with limits of time and memory, and without this process's open descriptors. The
-// code uses only POSIX, so that it can be copied into the daemon that installs packages. It keeps
-// no state and logs nothing, and any thread may call it.
+// code uses only the C library and /proc, so that it can be copied into the daemon that installs
+// packages. It keeps no state and logs nothing, and any thread may call it.
 #pragma once
 
 #include <cstddef>

@@ -94,6 +94,28 @@ TEST(RunProgram, ProgramHasDevNullStreamsAndNoOtherDescriptors) {
   close(inherited);
 }
 
+// Lowering the limit does not close the descriptors above it.
+TEST(RunProgram, ProgramHasNoDescriptorsAboveTheLimit) {
+  const int inherited = fcntl(STDIN_FILENO, F_DUPFD, 100);  // without O_CLOEXEC
+  ASSERT_GE(inherited, 100);
+  rlimit before = {};
+  getrlimit(RLIMIT_NOFILE, &before);
+  const rlimit fewer = {static_cast<rlim_t>(inherited), before.rlim_max};
+  setrlimit(RLIMIT_NOFILE, &fewer);
+  const std::string descriptors = Printed("ls /proc/self/fd");
+  setrlimit(RLIMIT_NOFILE, &before);
+  close(inherited);
+  EXPECT_EQ(descriptors, "0\n1\n2\n3\n");
+}
+
+// More descriptors than one system call lists.
+TEST(RunProgram, ProgramHasNoneOfVeryManyDescriptors) {
+  std::vector<int> inherited(500);
+  for (int& fd : inherited) fd = dup(STDIN_FILENO);
+  EXPECT_EQ(Printed("ls /proc/self/fd"), "0\n1\n2\n3\n");
+  for (const int fd : inherited) close(fd);
+}
+
 // A daemon may run without standard streams.
 TEST(RunProgram, ProgramHasItsStreamsEvenIfThisProcessHasNone) {
   std::string streams;
