@@ -83,8 +83,8 @@ inline constexpr Cause kToolNotStarted = {"tool-not-started", Group::kSimulation
     ChainLink::kKey, "", "%s", "Check --tool and --runner."};
 inline constexpr Cause kToolTimedOut = {"tool-timed-out", Group::kSimulation, Severity::kFailed,
     ChainLink::kKey, "", "it was still busy after %s and was stopped", "The tool waits as long "
-    "as its integrity value is ffffffff. It waits for a while if another process holds a lease "
-    "on the file. A large file may need a larger --timeout."};
+    "as its integrity value is ffffffff, and for a while if another process holds a lease on the "
+    "file. A large file may need a larger --timeout."};
 inline constexpr Cause kStandInsMissing = {"stand-ins-missing", Group::kSimulation,
     Severity::kFailed, ChainLink::kKey, "", "the simulator's libraries were not loaded into %s",
     "Check --tool: it has to be a dynamically linked program for this processor or for --runner."};
@@ -153,8 +153,8 @@ inline constexpr Cause kPackageWithoutManifest = {"package-without-manifest", Gr
 inline constexpr Cause kJarNotTrusted = {"jar-not-trusted", Group::kFile, Severity::kRefused,
     ChainLink::kKey, "`VELT can't verify a file`",
     "it is a plain JAR, which is signed only if the kernel already trusts it; the kernel answered "
-    "%s", "Nothing to do, unless the JAR should have come from a trusted image. Here --trust makes "
-    "the kernel trust it."};
+    "%s", "Nothing to do, unless the JAR should have come from a trusted image. In the simulator, "
+    "--trust makes the kernel trust it."};
 inline constexpr Cause kAndroidManifestDamaged = {"android-manifest-damaged", Group::kFile,
     Severity::kRefused, ChainLink::kKey, "`Can't extract Android Manifest`", "its "
     "AndroidManifest.xml cannot be extracted, so it counts as a plain JAR, which the kernel does "
