@@ -69,8 +69,9 @@ const CertificateFacts* OtherSigner(const Judgement& judgement, const Report& re
 
 namespace {
 
-// The API levels of the phones that install the package, such as "API 27 to 29". If `is_verified`
-// is false, the API levels of the phones that refuse the package.
+// The API levels of the phones that install the package, such as "API 27 to 29" or "API 27 and of
+// API 30 and later". If `is_verified` is false, the API levels of the phones that refuse the
+// package.
 std::string LevelsText(const std::vector<RangeJudgement>& ranges, bool is_verified) {
   std::vector<LevelRange> levels;
   for (const RangeJudgement& range : ranges) {
@@ -82,10 +83,9 @@ std::string LevelsText(const std::vector<RangeJudgement>& ranges, bool is_verifi
       levels.push_back(range.levels);
     }
   }
-  std::vector<std::string> texts;
-  texts.reserve(levels.size());
-  for (const LevelRange& each : levels) texts.push_back(LevelText(each));
-  return Joined(texts);
+  std::string text;
+  for (const LevelRange& each : levels) text += (text.empty() ? "" : " and of ") + LevelText(each);
+  return text;
 }
 
 // Sentences for the most frequent errors of apksig. "%s" is replaced by the issue's parameter with
