@@ -29,7 +29,8 @@ enum class RunEnd {
   kExited,      // with the status `value`
   kKilled,      // by the signal `value`; if memory runs out, the tool aborts (SIGABRT)
   kTimedOut,    // and then killed
-  kNotStarted,  // no child was made: `value` is the errno; the child failed to exec: `value` is 0
+  kNotStarted,  // if no child could be made, `value` is the errno; if the child could not prepare
+                // itself or exec the program, `value` is 0
   kLost,        // another thread of this process waited for the child, or SIGCHLD is ignored;
                 // `value` is the errno
 };

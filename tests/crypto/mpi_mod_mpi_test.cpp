@@ -101,9 +101,10 @@ TEST(MpiModMpi, IsRightFor2To8192AndAModulusOf128Limbs) {
 
 // The numbers are hexadecimal. d, the top limb of the divisor, is 8000ffff. half_digit
 // (crypto/mpi.cpp) first divides the top limb of A by the upper half of d: 48000000 / 8000 is 9000,
-// with remainder 0. half_digit then adds d to the remainder until the sum wraps or is at least
-// 9000 * ffff. The first sum is d itself. This sum did not wrap and is less than 9000 * ffff, so d
-// must be added again. If half_digit stopped after the first addition, the result of estimate_digit
+// with remainder 0. half_digit then multiplies the quotient by the lower half of d: the product is
+// 9000 * ffff. It adds d to the remainder until the sum wraps or is at least this product. The
+// first sum is d itself. This sum did not wrap and is less than the product, so d must be added
+// again. If half_digit stopped after the first addition, the result of estimate_digit
 // would be far too large. quotient_digit would then reduce the digit in steps of 1, which is slow.
 TEST(MpiModMpi, IsFastIfTheFirstSumEqualsTheDivisorsTopLimb) {
   const Number A({0x12345678, 0x0000abcd, 0x48000000});
