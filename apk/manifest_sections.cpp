@@ -59,9 +59,9 @@ void ManifestSections::reset(const uint8_t* text, size_t size) {
 
 // Sorts the open section if the new attribute starts at or after the offset patience_. The sort
 // drops repeated names, which could otherwise fill the table. Each sort compares all names of the
-// section. To save time, add() then moves patience_ beyond the start of the new attribute. The
-// distance is the total length of the remaining names, plus kTwoAttributes for each of these names,
-// plus kLittleText. kTwoAttributes is the length of two short attributes, such as "A: b", with
+// section. To save time, add() then moves patience_ beyond the start of the new attribute, by the
+// sum of these values: kLittleText, and for each name that the sort kept, the length of the name
+// plus kTwoAttributes. kTwoAttributes is the length of two short attributes, such as "A: b", with
 // their line ends.
 void ManifestSections::add(const ManifestAttribute& attribute) {
   constexpr size_t kTwoAttributes = 10;

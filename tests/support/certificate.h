@@ -1,8 +1,8 @@
 // Builds X.509 certificates (RFC 5280 §4.1), good and malformed.
 //
-// Build writes the Bytes in each field unchanged, so they include the identifier and length octets.
-// A test changes a certificate by assigning to a field. If a std::optional field has no value,
-// Build computes that field from the other members.
+// Build writes the Bytes of each field unchanged, so a field holds the complete encoding of its
+// value: identifier, length and contents octets. A test changes a certificate by assigning to a
+// field. If a std::optional field has no value, Build computes that field from the other members.
 #pragma once
 
 #include <optional>
