@@ -22,6 +22,7 @@ uint32_t SignAsPackage(ApkTools::Apk& apk, int fd);
 uint32_t SignAsJar(ApkTools::Apk& apk, int fd);
 std::vector<uint8_t> SignPayload(const std::vector<uint8_t>& data);
 bool SignLibrary(ApkTools::Apk& apk, const std::string& entry_name, const std::string& target);
+struct stat StateOf(int fd);
 
 }  // namespace
 
@@ -141,15 +142,22 @@ bool SignLibrary(ApkTools::Apk& apk, const std::string& entry_name, const std::s
   // through `library`, the descriptor to sign (docs/decisions/the-file-that-was-read.md). A library
   // is digested at most kMostDigests times.
   constexpr int kMostDigests = 3;
-  struct stat opened = {};
-  fstat(library.get(), &opened);
+  struct stat opened = StateOf(library.get());
   for (int digests = 1; !IsSameFile(read, opened); ++digests) {
     if (digests == kMostDigests || !S_ISREG(opened.st_mode)) return false;
     if (!apk.VerifyFileHash(entry_name, target, &read, library.get())) return false;
-    fstat(library.get(), &opened);
+    opened = StateOf(library.get());
   }
   VeltSignOat(apk, library.get());
   return true;
+}
+
+// The present state of the open file `fd`. If it cannot be read, the result is all zero, which is
+// not the state of a regular file.
+struct stat StateOf(int fd) {
+  struct stat state = {};
+  if (fstat(fd, &state) != 0) return {};
+  return state;
 }
 
 }  // namespace

@@ -102,6 +102,11 @@ class ChangedLibrary : public testing::Test {
     return count;
   }
 
+  // Makes each fstat of the descriptor to sign fail after this number of digests.
+  void FailStateAfter(int digests) {
+    file_.phone.fstat_error = [this, digests](int) { return digests_ == digests ? EIO : 0; };
+  }
+
   static void Make(const Change& change) {
     if (change) change();
   }
@@ -284,6 +289,21 @@ TEST_F(ChangedLibrary, IsRefusedIfWrittenToAfterItsThirdDigest) {
   };
   after_digest_[3] = [this] { WriteInPlace(); };
   ExpectRefused(3);
+}
+
+// --- The state of the file to sign cannot be read.
+
+TEST_F(ChangedLibrary, IsRefusedIfItsStateCannotBeReadAfterItsSecondOpening) {
+  FailStateAfter(1);
+  ExpectRefused(1);
+}
+
+// The state that was read before the second digest must not count as the state after it.
+TEST_F(ChangedLibrary, IsRefusedIfItsStateCannotBeReadAfterItsSecondDigest) {
+  before_second_open_ = [this] { Rename("good"); };
+  after_digest_[2] = [this] { WriteInPlace(); };
+  FailStateAfter(2);
+  ExpectRefused(2);
 }
 
 // --- Under a lease. The tool's second open of the library fails with EWOULDBLOCK, as it does if

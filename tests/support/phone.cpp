@@ -2,6 +2,7 @@
 #include "support/bytes.h"
 
 #include <fcntl.h>
+#include <sys/stat.h>
 #include <sys/types.h>
 #include <unistd.h>
 
@@ -60,6 +61,7 @@ extern "C" {
 
 int __real_open(const char* path, int flags, ...);
 ssize_t __real_read(int fd, void* buffer, size_t size);
+int __real_fstat(int fd, struct stat* state);
 FILE* __real_fopen(const char* path, const char* mode);
 int __real_fcntl(int fd, int command, ...);
 int __real_usleep(useconds_t microseconds);
@@ -88,6 +90,13 @@ ssize_t __wrap_read(int fd, void* buffer, size_t size) {
 
 ssize_t __wrap___read_chk(int fd, void* buffer, size_t size, size_t /*room*/) {
   return __wrap_read(fd, buffer, size);
+}
+
+int __wrap_fstat(int fd, struct stat* state) {
+  const int error = phone != nullptr && phone->fstat_error ? phone->fstat_error(fd) : 0;
+  if (error == 0) return __real_fstat(fd, state);
+  errno = error;
+  return -1;
 }
 
 // In a build with _FORTIFY_SOURCE, calls of open become calls of __open_2. Every build in an

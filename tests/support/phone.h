@@ -1,7 +1,7 @@
 // In a test program, replaces the parts that only a phone has: the kernel's integrity feature and
 // libzu.
 //
-// In a program that links phone.cpp, the linker must wrap open, read, fcntl, fopen, usleep,
+// In a program that links phone.cpp, the linker must wrap open, read, fstat, fcntl, fopen, usleep,
 // fgetxattr and readlink. It must also wrap the forms of open, read and readlink that
 // _FORTIFY_SOURCE uses. The target `phone` sets these options. The program's tests create a Phone,
 // and read the results from it. While no Phone exists, every wrapped call goes to the real system,
@@ -44,6 +44,8 @@ struct Phone {
   std::function<void(const char* path, int fd)> after_open;
   // The errno that an open() fails with; 0: the real system answers.
   std::function<int(const char* path, int flags)> open_error;
+  // The errno that an fstat() fails with; 0: the real system answers.
+  std::function<int(int fd)> fstat_error;
   // Called before and after each read().
   std::function<void(int fd)> before_read;
   std::function<void(int fd)> after_read;
