@@ -70,7 +70,11 @@ bool IsTrusted(const char* path) {
 // nothing, so the program does not request it.
 bool AskKernel(int fd) {
   struct stat state = {};
-  if (fstat(fd, &state) != 0 || !S_ISREG(state.st_mode)) {
+  if (fstat(fd, &state) != 0) {
+    PrintError("not trusted", errno);
+    return false;
+  }
+  if (!S_ISREG(state.st_mode)) {
     puts("not trusted (not a regular file)");
     return false;
   }

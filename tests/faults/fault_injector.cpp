@@ -7,12 +7,13 @@
 // Calls from the simulated phone's own libraries are passed on and not counted, except requests for
 // memory.
 //
-// The functions are malloc, open, read, fopen, readlink, fgetxattr, fstatvfs and fcntl. A function
-// with several names (open, open64 and the checked __open_2) counts as one function. malloc, calloc
-// and realloc also count as one function.
+// The functions are malloc, open, read, fstat, fopen, readlink, fgetxattr, fstatvfs and fcntl. A
+// function with several names (open, open64 and the checked __open_2) counts as one function.
+// malloc, calloc and realloc also count as one function.
 #include <dlfcn.h>
 #include <fcntl.h>
 #include <signal.h>
+#include <sys/stat.h>
 #include <sys/statvfs.h>
 #include <sys/syscall.h>
 #include <sys/types.h>
@@ -139,6 +140,15 @@ extern "C" ssize_t fgetxattr(int fd, const char* name, void* value, size_t size)
   static auto* const next = NextFunction<ssize_t(int, const char*, void*, size_t)>("fgetxattr");
   return Fails("fgetxattr", EIO, __builtin_return_address(0)) ? -1 : next(fd, name, value, size);
 }
+// Calls from the platform's libraries are passed on and not counted, because each release of these
+// libraries makes another number of calls.
+extern "C" int fstat(int fd, struct stat* state) {
+  static auto* const next = NextFunction<int(int, struct stat*)>("fstat");
+  const void* const caller = __builtin_return_address(0);
+  const bool is_counted = !IsIn("/android/", caller);
+  return is_counted && Fails("fstat", EIO, caller) ? -1 : next(fd, state);
+}
+
 extern "C" int fstatvfs(int fd, struct statvfs* state) {
   static auto* const next = NextFunction<int(int, struct statvfs*)>("fstatvfs");
   return Fails("fstatvfs", EIO, __builtin_return_address(0)) ? -1 : next(fd, state);

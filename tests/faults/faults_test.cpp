@@ -44,6 +44,18 @@ class KeptStandardError {
   const int saved_;
 };
 
+// Runs `tool` on `file` on the phone, with the fault, such as "open:1". If the call that the fault
+// names is made, this call fails, and the file `report` exists afterwards.
+ToolEnd RunWithFault(const std::string& tool, const std::string& file, const std::string& fault,
+                     const std::string& report, const PhoneSettings& phone) {
+  ToolCommand command = {
+      {}, tool, file, FAULT_INJECTOR ":" KERNEL_STAND_IN, SettingsToEnvironment(phone)};
+  if (AreProgramsEmulated()) command.runner = Split(APKTOOLKIT_RUNNER, ' ');
+  command.environment.push_back("APKTOOLKIT_FAULT=" + fault);
+  command.environment.push_back("APKTOOLKIT_FAULT_REPORT=" + report);
+  return RunTool(command, Deadline(20));
+}
+
 // A file installed in its own directory, and the phone that it is installed on.
 class Installed {
  public:
@@ -71,15 +83,10 @@ class Installed {
     std::filesystem::remove(directory_ / "report");
     std::filesystem::remove(directory_ / "journal");
     phone_.journal = directory_ / "journal";
-    ToolCommand command = {
-        {}, TOOL_PATH, file_, FAULT_INJECTOR ":" KERNEL_STAND_IN, SettingsToEnvironment(phone_)};
-    if (AreProgramsEmulated()) command.runner = Split(APKTOOLKIT_RUNNER, ' ');
-    command.environment.push_back("APKTOOLKIT_FAULT=" + fault);
-    command.environment.push_back("APKTOOLKIT_FAULT_REPORT=" + directory_ / "report");
     Outcome outcome;
     {
       const KeptStandardError kept(directory_ / "errors");
-      outcome.ending = RunTool(command, Deadline(20));
+      outcome.ending = RunWithFault(TOOL_PATH, file_, fault, directory_ / "report", phone_);
     }
     outcome.failed = std::filesystem::exists(directory_ / "report");
     outcome.grants = Grants(ContentOf(phone_.journal), file_);
@@ -167,6 +174,7 @@ TEST(FailedCalls, RemoveOnlyDependentGrantsOfAGoodPackage) {
   ExpectRuns(file, "LPK",
              {{"open", {"", "PK", "PK"}},     // the package; the library twice: to read, to sign
               {"read", {"PK"}},               // the library
+              {"fstat", {"PK", "PK"}},        // the library: before its digest, and after it
               {"fopen", {"PK", "LK"}},        // the tool's integrity value, before each signing
               {"fcntl", {"PK", "PK", "LK"}},  // a copy of the library's descriptor; each signing
               {"readlink", {"PK", "LPK"}},    // to find the libraries; to report a missing path
@@ -179,6 +187,7 @@ TEST(FailedCalls, RemoveOnlyDependentGrantsOfATrustedJar) {
   ExpectRuns(file, "J",
              {{"open", {""}},
               {"read", {}},
+              {"fstat", {}},
               {"fopen", {""}},
               {"fcntl", {"", ""}},  // the JAR's verification; its signing
               {"readlink", {"J"}},
@@ -191,6 +200,7 @@ TEST(FailedCalls, LeaveABadPackageWithoutGrants) {
   ExpectRuns(file, "",
              {{"open", {""}},
               {"read", {}},
+              {"fstat", {}},
               {"fopen", {}},
               {"fcntl", {}},
               {"readlink", {""}},
@@ -203,11 +213,37 @@ TEST(FailedCalls, LeaveADifferentLibraryUnsigned) {
   ExpectRuns(file, "P",
              {{"open", {"", "P"}},
               {"read", {"P"}},
+              {"fstat", {"P"}},
               {"fopen", {""}},
               {"fcntl", {"P", ""}},
               {"readlink", {"P"}},
               {"fstatvfs", {"P"}},
               {"fgetxattr", {}}});
+}
+
+// The exit status of apktoolkit-verify for a trusted file, and the end of the printed line. In this
+// run, one call fails.
+std::string AnswerOfVerify(const std::string& fault) {
+  const TempDir directory;
+  const std::string file = directory.Write("file", {});
+  PhoneSettings phone;
+  phone.journal = directory / "journal";
+  struct stat state = {};
+  EXPECT_EQ(stat(file.c_str(), &state), 0);
+  phone.trusted = {{state.st_dev, state.st_ino}};
+  const ToolEnd ending = RunWithFault(VERIFY_PATH, file, fault, directory / "report", phone);
+  std::string answer = "status " + std::to_string(ending.value) + ", ";
+  for (const auto& event : ParseEvents(ContentOf(phone.journal))) {
+    if (TextOf(event, "event") == "stdout") answer += TextOf(event, "text").substr(file.size());
+  }
+  return answer;
+}
+
+TEST(FailedCalls, AreTheReasonWhyVerifyDoesNotTrustAFile) {
+  EXPECT_EQ(AnswerOfVerify("open:1"), "status 1, : cannot be opened (errno 24, EMFILE)\n");
+  EXPECT_EQ(AnswerOfVerify("fstat:1"), "status 1, : not trusted (errno 5, EIO)\n");
+  EXPECT_EQ(AnswerOfVerify("fcntl:1"), "status 1, : not trusted (errno 5, EIO)\n");
+  EXPECT_EQ(AnswerOfVerify("fcntl:2"), "status 0, : trusted\n");
 }
 
 #ifdef __SANITIZE_ADDRESS__
