@@ -91,11 +91,11 @@ struct Protection {
   Share unlisted;   // entries without a digest in the manifest
   Share signature;  // the manifest, signature files and blocks
   std::vector<std::string> unlisted_names;
-  Share differing = {};         // entries that do not match the manifest
-  Share uncompared = {};        // listed entries that were not compared with the manifest
+  Share differing;              // entries that do not match the manifest
+  Share uncompared;             // listed entries that were not compared with the manifest
   uint64_t differing_seen = 0;  // the number of differing entries that the tool checked
-  std::vector<std::string> differing_names = {};
-  std::vector<std::string> missing_names = {};  // in the manifest, but not in the package
+  std::vector<std::string> differing_names;
+  std::vector<std::string> missing_names;  // in the manifest, but not in the package
 };
 
 enum class LinkState { kHolds, kBroken, kNotReached };
