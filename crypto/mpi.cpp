@@ -225,7 +225,8 @@ WRAPS_ON_PURPOSE void mpi_montmul(mpi* A, const mpi* B, const mpi* N, unsigned i
 
   // Deliberate: n limbs are subtracted even if the product, now in A, is below N. The time is then
   // about the same for all products. If the product is below N, A is subtracted from T, and the
-  // difference is not used. T has a copy of A from index n on, and this copy absorbs the borrow.
+  // difference is not used. From index n on, T is a copy of A. A borrow ends in this copy, so the
+  // subtraction writes nothing beyond T.
   if (mpi_compare_abs(A, N) >= 0) {
     subtract_with_borrow(n, N->p, A->p);
   } else {

@@ -25,7 +25,8 @@ extern "C" int LLVMFuzzerTestOneInput(const uint8_t* data, size_t size) {
   const std::string text(reinterpret_cast<const char*>(data), size);
   ManifestMf manifest;
   const bool valid = manifest.load(text);
-  Require(valid == static_cast<bool>(manifest), "the manifest converts to the result of load()");
+  Require(valid == static_cast<bool>(manifest),
+          "the manifest, converted to bool, is the result of load()");
 
   const ManifestModel expected = ReadManifest(text);
   Require(valid == expected.valid, "both parsers accept the text, or both refuse it");

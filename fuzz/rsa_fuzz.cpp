@@ -1,6 +1,7 @@
 // crypto/rsa.h: any key and signature. libcrypto computes the encoded message from the signature,
-// and the target derives the expected result from this message. The target needs no message for a
-// bad length, an even modulus, or a signature that is not less than the modulus.
+// and the target derives the expected result from this message. If the length is bad, the modulus
+// is even, or the signature is not less than the modulus, the target knows the expected result
+// without this message.
 #include "crypto/rsa.h"
 
 #include <algorithm>

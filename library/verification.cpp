@@ -17,9 +17,9 @@ namespace {
 
 // The start of each line that the tool's code logs for a refusal, and the reason that the line
 // gives. If the manifest does not parse, two of these lines are logged. First the parser logs
-// "Parse manifest: ", as for a signature file. Then its caller logs "Can't load manifest: ". Any
-// other refusal logs at most one of these lines, and can log this line twice. The line that was
-// logged last therefore gives the reason.
+// "Parse manifest: ", as for a signature file. Then its caller logs "Can't load manifest: ". For
+// any other refusal, the log has at most one kind of line from this table, once or twice. The line
+// that was logged last therefore gives the reason.
 constexpr struct LoggedReason {
   const char* start;
   Reason reason;

@@ -37,11 +37,11 @@ enum class SignOutcome {
 // Runs the programs apktoolkit-verify, apktoolkit-bound and apktoolkit in `directory`
 // ("/system/bin").
 //
-// The caller decides how to react. The caller should treat an untrusted package like a package for
-// which the kernel has no payload (the digest of the signer's key). After kTimedOut and
-// kOutOfMemory, some libraries can be signed already, because apktoolkit signs the libraries before
-// the package. In both cases, the last run of apktoolkit-verify did not report that the package
-// itself is trusted. Do not try again at once: the same file needs the same time and memory.
+// The caller decides how to react. The caller should treat an untrusted package like a package
+// whose signer the kernel does not know. After kTimedOut and kOutOfMemory, some libraries can be
+// signed already, because apktoolkit signs the libraries before the package. In both cases, the
+// last run of apktoolkit-verify did not report that the package itself is trusted. Do not try again
+// at once: the same file needs the same time and memory.
 SignOutcome SignPackage(const std::string& directory, const InstalledPackage& package,
                         const RunLimits& limits);
 

@@ -31,10 +31,11 @@ public final class SignerDigests {
     /**
      * Returns the digests of the current signers of an installed package. Needs API level 28 or
      * later ({@code PackageManager.GET_SIGNING_CERTIFICATES}). If the key was rotated, the result
-     * leaves out the earlier keys on purpose, because an attacker may have an earlier key. The
-     * kernel gets only the digest of a key, not the name of the package. If the result had an
-     * earlier key, the kernel could get the same digest for the owner's packages and for the
-     * attacker's packages.
+     * leaves out the earlier keys on purpose, because an attacker may have an earlier key. If the
+     * result had the earlier keys, the caller would also pass the owner's packages with a JAR
+     * signature of an earlier key to apktoolkit. The kernel gets only the digest of a key, not the
+     * name of the package. It would therefore get the same digest for the owner's packages and for
+     * the attacker's packages.
      */
     public static String of(SigningInfo info) throws CertificateException {
         return of(info.getApkContentsSigners());
