@@ -41,7 +41,7 @@ struct LibraryFacts {
   // Empty if no prefix in kLibraryDirectories (apk/native_libraries.h) matches `entry`.
   std::string place;
   // True if the tool reaches `entry`. The tool stops at the first library whose entry is damaged:
-  // `is_met` is false for this library and for all later libraries.
+  // it reaches neither this library nor those that it would read after it.
   bool is_met = true;
   int error = 0;               // errno of opening the file; 0: success, or `place` is empty
   bool has_directory = false;  // the file's directory exists
@@ -60,8 +60,8 @@ struct PackageFacts {
   // `entry_twice` are filled.
   int32_t archive_result = -1;
 
-  // The first name that the archive has twice. Empty if the archive has no name twice, or if the
-  // zip library opened the archive.
+  // The first name that the archive has twice. The zip library does not open an archive with such a
+  // name. Empty if there is no such name.
   std::string entry_twice;
 
   AndroidManifest manifest;
@@ -73,8 +73,8 @@ struct PackageFacts {
   std::vector<std::string> too_long;
   std::vector<ListedEntry> entries;
   std::vector<std::string> missing;  // names in MANIFEST.MF that the archive does not have
-  // In the order in which the tool reads the libraries' entries. Libraries with damaged entries are
-  // last.
+  // First the libraries with intact entries, in the order in which the tool reads these entries.
+  // Then the libraries with damaged entries.
   std::vector<LibraryFacts> libraries;
 };
 

@@ -115,7 +115,7 @@ int CopyPayload(const void* argument, std::string* payload) {
 
 // Copies `size` bytes from `from` to `to`. Returns false if the memory at `from` cannot be read.
 // As in the kernel, unreadable memory causes no signal. The bytes go through a file, because pwrite
-// reports unreadable memory as an error, with or without an emulator.
+// reports unreadable memory as an error. It also does so if the tool runs under an emulator.
 bool CopyIn(const char* from, size_t size, char* to) {
   const ssize_t wanted = static_cast<ssize_t>(size);
   return pwrite(Scratch(), from, size, 0) == wanted && pread(Scratch(), to, size, 0) == wanted;

@@ -28,8 +28,9 @@ __attribute__((constructor)) void ReplaceStandardOutput() {
   stdout = stream;
 }
 
-// The C library flushes `stdout` only after all destructors. Without this earlier flush, the last
-// output would be lost if a destructor that runs after this one ended the process.
+// The C library flushes `stdout` only after all destructors. A later destructor could end the
+// process before that flush, and the last output would be lost. This destructor therefore flushes
+// `stdout` itself.
 __attribute__((destructor)) void FlushStandardOutput() { fflush(stdout); }
 
 }  // namespace
