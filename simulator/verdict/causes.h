@@ -165,7 +165,7 @@ inline constexpr Cause kUnsigned = {"unsigned", Group::kSignature, Severity::kRe
     ChainLink::kKey, "", "it is unsigned: META-INF/MANIFEST.MF is missing",
     "Sign it: apksigner sign --v1-signing-enabled true."};
 inline constexpr Cause kNewerSchemeOnly = {"newer-scheme-only", Group::kSignature,
-    Severity::kRefused, ChainLink::kKey, "", "it is signed only with %s, and this tool reads only "
+    Severity::kRefused, ChainLink::kKey, "", "it is signed only with %s, but this tool reads only "
     "JAR signatures (v1): META-INF/MANIFEST.MF is missing", "Sign it with v1 as well: "
     "enableV1Signing true for the Gradle plugin, or apksigner sign --v1-signing-enabled true "
     "--min-sdk-version 23."};

@@ -26,7 +26,7 @@ TEST_F(Reason, PackageSignedOnlyWithNewerSchemesIsReported) {
   EXPECT_EQ(
       Told(4),
       Lines({"REFUSED  base.apk",
-             "  ✗ package                not signed: it is signed only with v2, v3, and "
+             "  ✗ package                not signed: it is signed only with v2, v3, but "
              "this tool reads only JAR signatures (v1): META-INF/MANIFEST.MF is missing",
              "      Sign it with v1 as well: enableV1Signing true for the Gradle plugin, or",
              "      apksigner sign --v1-signing-enabled true --min-sdk-version 23.", "-> 1"}));
