@@ -250,7 +250,7 @@ def text_table():
         if table != reader:
             if reader:
                 yield ''
-            yield f'| {table} | peak memory, bytes a byte | ns a byte |'
+            yield f'| {table} | peak memory, bytes per byte of text | ns per byte |'
             yield '|---|---|---|'
             reader = table
         yield '| ' + ' | '.join(cells) + ' |'

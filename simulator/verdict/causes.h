@@ -393,7 +393,7 @@ inline constexpr Cause kNotInstallable = {"not-installable", Group::kInstaller, 
     "Sign the package again, as the last step that changes it. If you did not build it, do not "
     "trust it. apksigner verify --min-sdk-version 27 names every fault."};
 inline constexpr Cause kNotInstallableOnSome = {"not-installable-on-some", Group::kInstaller,
-    Severity::kRefused, ChainLink::kNone, "", "phones of %s",
+    Severity::kRefused, ChainLink::kNone, "", "not all phones install it: %s",
     "Sign it so that all of these phones install it, as apksigner does by default. If the "
     "package is only for some of these phones, name their API levels with --api."};
 inline constexpr Cause kInstallerGaveUp = {"installer-gave-up", Group::kInstaller,
@@ -475,8 +475,8 @@ inline constexpr Cause kNotLaidOut = {"not-laid-out", Group::kWarning, Severity:
     "Build the package again with its libraries as lib/ABI/NAME."};
 inline constexpr Cause kCertificateOtherKey = {"certificate-other-key", Group::kWarning,
     Severity::kAlarm, ChainLink::kNone, "",
-    "its certificate shows another key than the tool reads: %s", "If you did not build this "
-    "package, do not trust it: other programs see another key in it."};
+    "other programs do not find the key that the tool reads in its certificate: they find %s",
+    "If you did not build this package, do not trust it."};
 inline constexpr Cause kBlockAmbiguous = {"block-ambiguous", Group::kWarning, Severity::kAlarm,
     ChainLink::kNone, "",
     "other programs may find a different signer in its signature block: %s",

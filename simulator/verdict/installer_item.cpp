@@ -26,7 +26,7 @@ void AddInstallerItem(const Judgement& judgement, const JudgeOptions& options,
   const std::string why = WhyRefusedByInstaller(refused->errors[0]);
   const std::string takers = LevelsText(judgement.ranges, true);
   if (takers.empty()) return add({&cause::kNotInstallable, why});
-  add({&cause::kNotInstallableOnSome, takers + " install it, but phones of " +
+  add({&cause::kNotInstallableOnSome, "those of " + takers + " do, but those of " +
                                           LevelsText(judgement.ranges, false) +
                                           " refuse it: " + why});
 }

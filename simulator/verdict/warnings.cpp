@@ -59,7 +59,7 @@ void WarnOfTwoFaces(const PackageFacts& facts, const Report& report, Reasons* wa
   if (report.key && jar.certificate) {
     const std::string& shown = jar.certificate->key.modulus_sha256;
     const std::string detail =
-        shown.empty() ? "no key that others can read" : "modulus SHA-256 digest: " + shown;
+        shown.empty() ? "no key" : "a modulus with the SHA-256 digest " + shown;
     if (shown != report.key->sha256) warnings->push_back({&cause::kCertificateOtherKey, detail});
   }
   if (jar.key && (!jar.certificate || !jar.block.is_whole)) {

@@ -152,8 +152,8 @@ TEST(Installer, SaysWhichPhonesRefuse) {
   EXPECT_EQ(
       Told("target-30-v1-alone"),
       Lines({"NOT INSTALLABLE",
-             "phones of API 27 to 29 install it, but phones of API 30 and later refuse it: an app "
-             "that targets API 30 must be signed with v2 or later",
+             "not all phones install it: those of API 27 to 29 do, but those of API 30 and later "
+             "refuse it: an app that targets API 30 must be signed with v2 or later",
              "-> 1"}));
   EXPECT_EQ(Told("target-30-v1-alone", {"--api", "27-29"}),
             Lines({"SIGNED", "phones of API 27 to 29 install it, verified by v1", "-> 0"}));
@@ -190,9 +190,9 @@ TEST(Installer, SignerOnlyForLaterPhonesIsFound) {
   const Lines told = Told("later-v3");
   EXPECT_EQ(told.front(), "NOT INSTALLABLE");
   // The reason is not compared, because it depends on the version of apksig.
-  EXPECT_EQ(told[1].substr(0, told[1].find(": ")),
-            "phones of API 27 and of API 30 and later install it, but phones of API 28 to 29 "
-            "refuse it");
+  EXPECT_EQ(told[1].substr(0, told[1].find("refuse it: ")),
+            "not all phones install it: those of API 27 and of API 30 and later do, but those of "
+            "API 28 to 29 ");
   EXPECT_EQ(told.back(), "-> 1");
   EXPECT_EQ(Told("later-v3", {"--api", "27"}),
             Lines({"SIGNED", "phones of API 27 install it, verified by v2", "-> 0"}));
@@ -227,8 +227,8 @@ TEST(Installer, RefusalByTheOldestPhonesIsReportedDespiteV3) {
   EXPECT_EQ(
       Told("without-v2"),
       Lines({"NOT INSTALLABLE",
-             "phones of API 28 and later install it, but phones of API 27 refuse it: it was also "
-             "signed with APK Signature Scheme v2, but that signature is missing",
+             "not all phones install it: those of API 28 and later do, but those of API 27 refuse "
+             "it: it was also signed with APK Signature Scheme v2, but that signature is missing",
              "-> 1"}));
 }
 

@@ -68,13 +68,13 @@ TEST(InstallerItem, SaysWhyNoPhoneInstallsThePackage) {
 TEST(InstallerItem, SaysWhichPhonesInstallThePackage) {
   const Judgement judgement = Judged({Taken(27, 29), Refused(30, kNewestLevel, kFault)});
   EXPECT_EQ(Told(judgement),
-            "not-installable-on-some: phones of API 27 to 29 install it, but phones of API 30 and "
-            "later refuse it: a fault of x (A_FAULT)");
+            "not-installable-on-some: not all phones install it: those of API 27 to 29 do, but "
+            "those of API 30 and later refuse it: a fault of x (A_FAULT)");
   EXPECT_EQ(TakersText(judgement), "");
   EXPECT_EQ(Told(Judged({Refused(27, 27, kFault), Taken(28, 29), Refused(30, 32, kFault),
                          Refused(33, 33, kFault)})),
-            "not-installable-on-some: phones of API 28 to 29 install it, but phones of API 27 and "
-            "of API 30 to 33 refuse it: a fault of x (A_FAULT)");
+            "not-installable-on-some: not all phones install it: those of API 28 to 29 do, but "
+            "those of API 27 and of API 30 to 33 refuse it: a fault of x (A_FAULT)");
 }
 
 TEST(InstallerItem, NamesTheEntry) {
