@@ -22,8 +22,8 @@ bool IsPlainText(const uint8_t* eight) {
   uint64_t bytes;
   memcpy(&bytes, eight, sizeof(bytes));
   // Setting the high bit of each byte prevents a borrow from the next byte. The subtraction clears
-  // that bit only if the byte's low seven bits are less than the least plain byte. A byte whose own
-  // high bit is set is always plain: `| bytes` sets the bit again.
+  // that bit only if the byte's low seven bits are at most kGreatestLineEnd. A byte whose own high
+  // bit is set is always plain: `| bytes` sets the bit again.
   return ((((bytes | kHighBits) - kLeastPlain) | bytes) & kHighBits) == kHighBits;
 }
 
@@ -115,13 +115,13 @@ class Parser {
     return true;
   }
 
-  // Deliberate: if a line break follows the colon directly, the cursor always moves to the second
-  // byte after the colon. If the line break is CR LF or LF CR, that byte is its second byte. If the
-  // line break is a lone CR or LF, that byte is the first byte of the next line. The parser then
-  // treats this first byte as the line break. A name on the next line loses its first byte. The
-  // next line is not recognised if it is empty, or if it is a continuation line that starts with a
-  // single space. Signing tools write CR LF. Texts with other line breaks have always been read by
-  // this rule, so the rule must stay.
+  // Deliberate: if a line break follows the colon directly, the cursor skips the colon and one byte
+  // of the line break. The parser then takes the next byte for the rest of the line break. This is
+  // right for CR LF and LF CR. After a lone CR or LF, the next byte is the first byte of the next
+  // line, and this byte is lost. A name then loses its first byte. An empty line does not end the
+  // section. A continuation line that starts with a single space is read as a name. Signing tools
+  // write CR LF. Texts with other line breaks have always been read by this rule, so the rule must
+  // stay.
   bool passColon() {
     const char next = byteAt(cursor_ + 1);
     if (next != ' ' && !IsLineBreak(next)) {
