@@ -27,8 +27,8 @@ std::vector<DrawnPart> DrawBar(const Protection& protection, uint64_t file_size)
   std::vector<DrawnPart> parts = {
       {"verified", kVerifiedWord, "dex and native libraries, compared with the manifest", true,
        protection.verified, 0, 0, 0},
-      {"vouched", kVouchedWord, "match the manifest, but the tool does not check them", true,
-       protection.vouched, 0, 0, 0},
+      {"vouched", kVouchedWord, "match the manifest: compared by the simulator, not by the tool",
+       true, protection.vouched, 0, 0, 0},
       {"differing", kDifferingWord, "changed after signing: the manifest has another digest", true,
        protection.differing, 0, 0, 0},
       {"uncompared", kUncomparedWord,

@@ -92,7 +92,7 @@ std::string SignerText(const Report& report, const char* ellipsis) {
 std::string OtherOwnerText(const Report& report) {
   if (report.verdict != Verdict::kOtherSigner) return {};
   const CertificateFacts* const other = OtherSigner(report.installer, report);
-  return other == nullptr ? "" : "phones install it for " + other->subject;
+  return other == nullptr ? "" : "phones install it for the signer " + other->subject;
 }
 
 std::vector<std::string> AlarmFacts(const Report& report) {

@@ -104,8 +104,8 @@ std::string TextOf(const Link& link);
 using Rows = std::vector<std::pair<std::string, std::string>>;
 // The facts of a certificate, as libcrypto reads it. The tool has its own parser.
 Rows CertificateRows(const CertificateFacts& certificate);
-// The facts of the JAR signer: its certificate, and the digest in Report::key. The kernel got this
-// digest, or the tool would send it.
+// The facts of the JAR signer: its certificate, and the digest in Report::key. This digest is the
+// one that the kernel got. If the kernel got none, it is the one that the tool would send.
 Rows SignerRows(const Report& report);
 
 // The words for the parts of the package in Protection (simulator/verdict/report.h).

@@ -94,9 +94,10 @@ TEST(PageTable, ShowsForWhichOtherSignerPhonesInstallIt) {
   other.key = {"RSA", 2048, "", std::string(64, 'c')};
   report.installer.state = Judgement::State::kJudged;
   report.installer.ranges = {{{27, kNewestLevel}, true, {"v2"}, {{"v2", other}}, {}, {}}};
-  EXPECT_EQ(RowsOf({report, Example("b", Verdict::kSigned)})[0],
-            "SIGNED, OTHER SIGNER|a|phones install it for CN=Other|||unknown, RSA-2048, key "
-            "bbbbbbbb…bbbbbb|");
+  EXPECT_EQ(
+      RowsOf({report, Example("b", Verdict::kSigned)})[0],
+      "SIGNED, OTHER SIGNER|a|phones install it for the signer CN=Other|||unknown, RSA-2048, key "
+      "bbbbbbbb…bbbbbb|");
 }
 
 TEST(PageTable, ShowsTheKeyAfterALongName) {

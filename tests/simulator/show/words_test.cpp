@@ -158,8 +158,8 @@ TEST(HeadFacts, NameTheOtherSigner) {
   range.signers[0].certificate.subject = "CN=other";
   range.signers[0].certificate.key.sha256 = "other";
   report.installer.ranges = {range};
-  EXPECT_EQ(HeadFacts(report, "..."),
-            Lines({"com.app", "signer CN=a, RSA-512", "phones install it for CN=other"}));
+  EXPECT_EQ(HeadFacts(report, "..."), Lines({"com.app", "signer CN=a, RSA-512",
+                                             "phones install it for the signer CN=other"}));
 }
 
 TEST(SignerRows, SayWhetherTheKernelGotTheKey) {
