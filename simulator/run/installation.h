@@ -21,8 +21,8 @@ enum class InstalledAbi {
 
 // Which packages are laid out.
 enum class InstallWhen {
-  kAlone,   // packages that have neither their libraries nor an installer's library directories
-            // beside them; no package on a read-only file system
+  kAlone,   // packages beside which there are no libraries and no library directories of an
+            // installer; but a package on a read-only file system is never laid out
   kAlways,  // all packages whose libraries an installer extracts
   kNever,
 };

@@ -21,16 +21,17 @@ struct Attempt {
     kBegun,  // the tool began, and no result is known
     kSigned,
     kKernelRefused,
-    kNotAsked,     // `integrity` is the reason why the tool did not ask the kernel
+    kNotAsked,     // because of the member `integrity`, the tool did not ask the kernel
     kNotVerified,  // a library that the tool refused: see `why`
     kVanished,     // a library that could not be opened again after its check
   };
 
   std::string path;  // from the log or the kernel; can be empty
   Outcome outcome = Outcome::kBegun;
-  int64_t error = 0;                      // the errno of the kernel's refusal or of the failed open
-  std::string payload;                    // the bytes that the kernel got, in hexadecimal
-  std::optional<std::string> integrity;   // last value read; none: not read, or no integrity file
+  int64_t error = 0;    // the errno of the kernel's refusal or of the failed open
+  std::string payload;  // the bytes that the kernel got, in hexadecimal
+  // The integrity value that the tool read last; none: it read no value, or there was no file.
+  std::optional<std::string> integrity;
   LogMeaning why = LogMeaning::kUnknown;  // the first error about a refused library, if any
 };
 

@@ -31,8 +31,9 @@ class SignedBytes {
 
   // True if the file at `path` has bytes that were signed. False for a file that is not regular.
   // Also false if the file must be digested, but cannot be read before the deadline. Without a
-  // directory, can also be false for the bytes of a signed file if the state of that file
-  // (IsSameFile in util/file.h) changed before this object digested the bytes.
+  // directory, a signed file is digested later, and only if its state (IsSameFile in util/file.h)
+  // has not changed since Add(). If the state has changed, the signed bytes are not known, and the
+  // result is false for another file with these bytes.
   bool Holds(const std::string& path, const Deadline& deadline);
 
   // Remembers the present bytes of the file at `path`. With a directory, returns false if the

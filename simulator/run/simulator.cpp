@@ -44,9 +44,9 @@ std::string OwnDescriptorPath(int fd) {
   return "/proc/" + std::to_string(getpid()) + "/fd/" + std::to_string(fd);
 }
 
-// The result for a name for which the tool is not run (ListedFile::State): a directory without
-// packages, an unreadable directory, or an unreadable entry of a directory. The result has only the
-// name, the path, and the reason why the tool is not run.
+// For some names, the tool is not run (ListedFile::State): for a directory without packages, an
+// unreadable directory, or an unreadable entry of a directory. The result for such a name has only
+// the name, the path, and the reason why the tool is not run.
 FileRun RunOfDirectory(const ListedFile& directory) {
   FileRun run;
   const std::string path = Resolved(directory.name);

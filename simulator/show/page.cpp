@@ -101,8 +101,8 @@ data FileFields(const Report& report, size_t number, const PageRun& run) {
   return file;
 }
 
-// Each long part is cut before the parts are joined. If the joined text were cut, the key after a
-// long name could be lost.
+// Each long part is cut before the parts are joined. If the joined text were cut, the signer's key
+// could be lost, because it stands after the signer's name, which can be long.
 list HeadLines(const Report& report) {
   Report head;
   head.package_name = Short(report.package_name);
