@@ -82,12 +82,12 @@ void Gate::DemandExpectedSigner(Report* report) const {
   };
   for (const RangeJudgement& range : report->installer.ranges) {
     for (const CertificateFacts* const signer : NewestSigners(range)) {
-      demand(*signer, "phones install it for ");
+      demand(*signer, "phones install it for this signer: ");
     }
   }
   if (IsJudged(*report)) return;
   for (const NewerSignerFacts& signer : report->newer) {
-    demand(signer.certificate, "its " + signer.scheme + " signature names ");
+    demand(signer.certificate, "its " + signer.scheme + " signature names this signer: ");
   }
 }
 

@@ -22,6 +22,11 @@ const CertificateFacts kOwner = SignerWith('a');
 const CertificateFacts kOther = SignerWith('b');
 const CertificateFacts kThird = SignerWith('c');
 
+// The name and the digests of kOther.
+const std::string kOtherText = "CN=b (SHA-256 digest of the certificate " + kOther.sha256 +
+                               ", of the public key " + kOther.key.sha256 + ", of the modulus " +
+                               kOther.key.modulus_sha256 + ")";
+
 // The report of a package that the tool verified and the kernel signed.
 Report SignedBy(const CertificateFacts& signer, const std::string& file = "base.apk") {
   Report report;
@@ -73,6 +78,17 @@ Judged With(const Lines& signers, const Report& report) {
   return {Added(report, judged), judged.verdict};
 }
 
+// The reason of the only item that the gate adds.
+std::string ReasonWith(const Lines& signers, const Report& report) {
+  GateOptions options;
+  options.signers = signers;
+  Report judged = report;
+  Gate(options).Judge(&judged);
+  EXPECT_EQ(judged.items.size(), report.items.size() + 1);
+  EXPECT_EQ(judged.items.back().kind, ItemKind::kSigner);
+  return judged.items.back().reason.Text();
+}
+
 void ExpectTaken(const Lines& signers, const Report& report) {
   const Judged judged = With(signers, report);
   EXPECT_EQ(judged.codes, Lines());
@@ -119,27 +135,38 @@ TEST(Gate, SignerIsKnownByEachOfHisDigests) {
 }
 
 TEST(Gate, SaysWhoIsExpectedAndWhoSigned) {
-  GateOptions options;
-  options.signers = {kOwner.sha256, kThird.key.sha256};
-  Report report = SignedBy(kOther);
-  Gate(options).Judge(&report);
-  EXPECT_EQ(report.items[1].kind, ItemKind::kSigner);
-  EXPECT_EQ(report.items[1].reason.Text(),
+  EXPECT_EQ(ReasonWith({kOwner.sha256, kThird.key.sha256}, SignedBy(kOther)),
             "its signer is not one that --signer names: expected " + kOwner.sha256 + " or " +
-                kThird.key.sha256 +
-                ", and the JAR signature is by CN=b (SHA-256 digest of the "
-                "certificate " +
-                kOther.sha256 + ", of the public key " + kOther.key.sha256 + ", of the modulus " +
-                kOther.key.modulus_sha256 + ")");
+                kThird.key.sha256 + ", and the JAR signature is by " + kOtherText);
+}
+
+TEST(Gate, SaysForWhomPhonesInstallIt) {
+  const Report report = InstalledFor(SignedBy(kOwner), {Takes(27, {{"v3", kOther}})});
+  EXPECT_EQ(ReasonWith({kOwner.sha256}, report),
+            "its signer is not one that --signer names: expected " + kOwner.sha256 +
+                ", and phones install it for this signer: " + kOtherText);
+}
+
+TEST(Gate, SaysWhomANewerSignatureNames) {
+  Report report = SignedBy(kOwner);
+  report.newer = {{"v3", kOther}};
+  EXPECT_EQ(ReasonWith({kOwner.sha256}, report),
+            "its signer is not one that --signer names: expected " + kOwner.sha256 +
+                ", and its v3 signature names this signer: " + kOtherText);
+}
+
+TEST(Gate, SaysWhoseKeyIsForgeable) {
+  Report report = SignedBy(kOther);
+  report.warnings = {{&cause::kForgeableKey, "1"}};
+  EXPECT_EQ(ReasonWith({kOther.sha256}, report),
+            "its signer is not one that --signer names: expected " + kOther.sha256 +
+                ", and anyone can sign with the key of " + kOtherText);
 }
 
 TEST(Gate, SaysThatASignerHasNoReadableName) {
-  GateOptions options;
-  options.signers = {kOwner.sha256};
   Report report = SignedBy(kOther);
   report.signer.reset();
-  Gate(options).Judge(&report);
-  EXPECT_EQ(report.items[1].reason.Text(),
+  EXPECT_EQ(ReasonWith({kOwner.sha256}, report),
             "its signer is not one that --signer names: expected " + kOwner.sha256 +
                 ", and the JAR signature is by a signer without a readable name (SHA-256 digest of "
                 "the modulus " +
