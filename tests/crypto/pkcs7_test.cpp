@@ -294,9 +294,9 @@ TEST(ProcessCertKey, ExponentElementMayNotBeLongerThanTheModulus) {
   EXPECT_EQ(processed.record.modulus_length, 4u);
 }
 
-// The exponent's element has five bytes. With its leading zero, the first modulus has five bytes,
-// and the second has four. The record leaves out the zero, but the limit for the exponent's element
-// counts the zero.
+// Both moduli begin with a zero byte. The first modulus has five bytes with this zero, and the
+// second modulus has four bytes with it. The exponent's element has five bytes. The record leaves
+// out the zero, but the limit for the exponent's element counts the zero.
 TEST(ProcessCertKey, ExponentMayBeAsLongAsTheModulusWithItsLeadingZero) {
   const ProcessedBlock processed(WithRsaKey(Concat({{0x00}, Bytes(4, 0x77)}), {1, 0, 1}));
   EXPECT_EQ(processed.result, 0);

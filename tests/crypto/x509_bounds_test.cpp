@@ -118,10 +118,10 @@ TEST(X509TooLongElement, ElementsOfANameMayNotUseBytesAfterTheirContainer) {
   for (const Bytes& name : cases) EXPECT_EQ(ResultOf(WithSubject(name)), -12);
 }
 
-// In the first case, notAfter ends in "0", not in "Z". In the second case, the last two characters
-// of notAfter are missing. The subject follows the times. The subject has 90 bytes of contents, so
-// its first bytes are 30 5a. As text, these bytes are "0Z", which would complete notAfter in the
-// second case.
+// The subject follows the times. The subject has 90 bytes of contents, so its first bytes are
+// 30 5a. As text, these bytes are "0Z". In the first case, notAfter has the right length, but its
+// own last character is "0" instead of "Z". In the second case, notAfter has two characters fewer
+// than its length says, and the "0Z" of the subject would complete it.
 TEST(X509TooLongElement, TimeIsMinus13) {
   Certificate certificate = WithSubject(Name({{kCommonName, std::string(79, 'x')}}));
   ASSERT_EQ(certificate.subject[0], '0');

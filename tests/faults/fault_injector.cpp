@@ -5,7 +5,7 @@
 //   APKTOOLKIT_FAULT_REPORT  a file that is made at that call
 //
 // Calls from the simulated phone's own libraries are passed on and not counted, except requests for
-// memory.
+// memory. Calls of fstat from the platform's libraries are not counted either.
 //
 // The functions are malloc, open, read, fstat, fopen, readlink, fgetxattr, fstatvfs and fcntl. A
 // function with several names (open, open64 and the checked __open_2) counts as one function.
@@ -140,8 +140,8 @@ extern "C" ssize_t fgetxattr(int fd, const char* name, void* value, size_t size)
   static auto* const next = NextFunction<ssize_t(int, const char*, void*, size_t)>("fgetxattr");
   return Fails("fgetxattr", EIO, __builtin_return_address(0)) ? -1 : next(fd, name, value, size);
 }
-// Calls from the platform's libraries are passed on and not counted, because each release of these
-// libraries makes another number of calls.
+// Calls of fstat from the platform's libraries are passed on and not counted, because the number of
+// these calls depends on the release of the libraries.
 extern "C" int fstat(int fd, struct stat* state) {
   static auto* const next = NextFunction<int(int, struct stat*)>("fstat");
   const void* const caller = __builtin_return_address(0);

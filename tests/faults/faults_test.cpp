@@ -221,8 +221,8 @@ TEST(FailedCalls, LeaveADifferentLibraryUnsigned) {
               {"fgetxattr", {}}});
 }
 
-// The exit status of apktoolkit-verify for a trusted file, and the end of the printed line. In this
-// run, one call fails.
+// Runs apktoolkit-verify for a trusted file. The call that `fault` names fails in this run. Returns
+// the exit status, and the end of the printed line.
 std::string AnswerOfVerify(const std::string& fault) {
   const TempDir directory;
   const std::string file = directory.Write("file", {});
