@@ -54,30 +54,29 @@ void ManifestSections::reset(const uint8_t* text, size_t size) {
   attributes_.clear();
   attributes_.reserve(std::min(size / kShortAttribute, kManyAttributes));
   ends_.clear();
-  patience_ = kLittleText;
+  next_sort_ = kLittleText;
 }
 
-// Sorts the open section if the new attribute starts at or after the offset patience_. The sort
+// Sorts the open section if the new attribute starts at or after the offset next_sort_. The sort
 // drops repeated names, which could otherwise fill the table. Each sort compares all names of the
-// section. To save time, add() then moves patience_ beyond the start of the new attribute, by the
-// sum of these values: kLittleText, and for each name that the sort kept, the length of the name
-// plus kTwoAttributes. kTwoAttributes is the length of two short attributes, such as "A: b", with
-// their line ends.
+// section. To save time, the next sort is delayed by kLittleText bytes of text, and by the length
+// and kTwoAttributes more bytes of each name that is still in the section. kTwoAttributes is the
+// length of two short attributes, such as "A: b", with their line ends.
 void ManifestSections::add(const ManifestAttribute& attribute) {
   constexpr size_t kTwoAttributes = 10;
   attributes_.push_back(attribute);
-  if (attribute.name.start < patience_) return;
+  if (attribute.name.start < next_sort_) return;
   order();
-  patience_ = attribute.name.start + kLittleText;
+  next_sort_ = attribute.name.start + kLittleText;
   for (size_t i = openStart(); i < attributes_.size(); ++i) {
-    patience_ += attributes_[i].name.length + kTwoAttributes;
+    next_sort_ += attributes_[i].name.length + kTwoAttributes;
   }
 }
 
 void ManifestSections::endSection() {
   order();
   ends_.push_back(static_cast<uint32_t>(attributes_.size()));
-  patience_ = kLittleText + (attributes_.empty() ? 0 : attributes_.back().name.start);
+  next_sort_ = kLittleText + (attributes_.empty() ? 0 : attributes_.back().name.start);
 }
 
 // Sorts the open section by name. Of attributes with equal names, keeps only the last one in the

@@ -97,8 +97,8 @@ class ManifestSections {
 
  private:
   // add() also sorts the open section from time to time, so that repeated names do not fill the
-  // memory. In a section, the attributes that cause two such sorts start at least this many bytes
-  // apart. The first such sort in a section can come after less text.
+  // memory. After such a sort, add() does not sort the section again within this many bytes of
+  // text.
   static constexpr size_t kLittleText = 1024;
 
   size_t openStart() const { return ends_.empty() ? 0 : ends_.back(); }
@@ -106,6 +106,6 @@ class ManifestSections {
 
   const char* text_ = nullptr;
   std::vector<ManifestAttribute> attributes_;
-  std::vector<uint32_t> ends_;     // the index in attributes_ at which each section ends
-  size_t patience_ = kLittleText;  // an attribute at or after this offset causes a sort
+  std::vector<uint32_t> ends_;      // the index in attributes_ at which each section ends
+  size_t next_sort_ = kLittleText;  // add() sorts if an attribute starts at or after this offset
 };

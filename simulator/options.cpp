@@ -197,11 +197,11 @@ void AddInstallation(CLI::App* app, Options* options) {
     return is_known ? std::string() : name + " is not one of phone, all, arm64, arm and no";
   };
   app->add_option_function<std::string>(kInstall, install,
-                                        "First extract the libraries, as an installer\n"
-                                        "does, into a temporary directory: for phone,\n"
-                                        "all, arm64 or arm; \"no\" extracts nothing\n"
-                                        "[default: phone, if no libraries are beside the\n"
-                                        "package]")
+                                        "First extract the libraries into a temporary\n"
+                                        "directory, as an installer does. ABI is one of\n"
+                                        "phone, all, arm64, arm and no, which extracts\n"
+                                        "nothing [default: phone, if no libraries are\n"
+                                        "beside the package]")
       ->type_name("[=ABI]")
       ->check(check)
       ->take_last();
@@ -262,9 +262,9 @@ void AddGate(CLI::App* app, Options* options) {
       ->check(is_digest)
       ->allow_extra_args(false);
   app->add_flag("--werror", options->gate.refuses_warnings,
-                "Warnings count as refusals. A package that\n"
-                "phones install for another signer than the JAR\n"
-                "signer is also refused");
+                "Warnings count as refusals. A package is also\n"
+                "refused if phones install it as signed by a\n"
+                "signer other than the JAR signer");
 }
 
 void AddOutput(CLI::App* app, Options* options) {

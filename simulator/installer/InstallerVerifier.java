@@ -175,9 +175,10 @@ public final class InstallerVerifier {
     // Returns the verifier's answer for these levels. Phones of API 30 and later require v2 or
     // later if the app targets 30 or later. The verifier checks this rule only if the range ends at
     // the app's target level or later. If the package has neither v3 nor v3.1, a range that ends at
-    // 30 or later is therefore verified without an upper end. For this package, the missing end
-    // changes nothing else in the answer. A package with v3 or v3.1 is verified with the exact end,
-    // because its signers can be for some levels only.
+    // 30 or later is therefore verified without an upper end, so the verifier checks the rule.
+    // The rest of its answer does not depend on the end, because only v3 and v3.1 have signers for
+    // some levels only. For the same reason, a package with v3 or v3.1 is verified with the exact
+    // end.
     private static Range verify(DataSource source, int first, int last, boolean hasNewer)
             throws Exception {
         if (first >= KNOWS_V31 && !hasMethod(ApkVerifier.Result.class, "isVerifiedUsingV31Scheme")
@@ -228,7 +229,7 @@ public final class InstallerVerifier {
     }
 
     // True if the cause of the exception is an entry whose data are longer than its declared
-    // length. The package is then malformed, and reading the file did not fail.
+    // length. Then the package is malformed. Otherwise the file could not be read.
     private static boolean isOfDamagedData(Throwable failure) {
         for (Throwable cause = failure; cause != null; cause = cause.getCause()) {
             if (cause instanceof BufferOverflowException) {

@@ -16,8 +16,9 @@
 
 namespace simulator {
 
-// kAuto: Judge asks the installer if Missing() returns none. kRequired: the same, but the run fails
-// if Missing() returns a text. kOff: Judge never asks the installer.
+// kAuto: the installer is asked if it is installed. kRequired: the same, but the run fails if the
+// installer is not installed. kOff: the installer is never asked. Installer::Missing says whether
+// the installer is installed.
 enum class InstallerUse { kAuto, kRequired, kOff };
 
 struct InstallerOptions {

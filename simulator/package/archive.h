@@ -48,10 +48,10 @@ struct ArchiveWalk {
 
 class Archive {
  public:
-  // In bytes of uncompressed data: Read() refuses longer entries.
+  // Read() refuses entries with more bytes of uncompressed data.
   static constexpr uint32_t kLongestRead = 64 << 20;
 
-  // In bytes of uncompressed data: ReadToCompare() refuses longer entries.
+  // ReadToCompare() refuses entries with more bytes of uncompressed data.
   static constexpr uint32_t kLongestCompared = 512 << 20;
 
   enum class ReadResult { kRead, kMissing, kDamaged, kTooLong };

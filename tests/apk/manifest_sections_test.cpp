@@ -130,9 +130,9 @@ TEST(ManifestSection, LastOfEqualNamesCounts) {
 
 // Two long names that differ only in their last byte come before very many short names. The
 // addition of the second long name compares the long names once. While the short names are added,
-// the long names are unreadable, so a comparison of a long name would crash. add() may compare the
-// long names again only for an attribute that starts at least 2 * kLength bytes after the start of
-// the second long name. All short names start before this point.
+// the long names are unreadable, so a comparison of a long name would crash. No such comparison is
+// allowed in the 2 * kLength bytes from the start of the second long name. All short names start in
+// these bytes.
 TEST(ManifestSection, LongNamesAreNotComparedAgainForEachShortName) {
   constexpr uint32_t kLength = 1 << 20;
   constexpr size_t kAll = 3 * kLength;

@@ -104,8 +104,10 @@ TEST(MpiModMpi, IsRightFor2To8192AndAModulusOf128Limbs) {
 // with remainder 0. half_digit then multiplies the quotient by the lower half of d: the product is
 // 9000 * ffff. It adds d to the remainder until the sum wraps or is at least this product. The
 // first sum is d itself. This sum did not wrap and is less than the product, so d must be added
-// again. If half_digit stopped after the first addition, the result of estimate_digit
-// would be far too large. quotient_digit would then reduce the digit in steps of 1, which is slow.
+// again. If half_digit stopped after the first addition, it would subtract the product from a
+// smaller sum, and the difference would wrap. estimate_digit, which calls half_digit, would then
+// return a far too large digit, and quotient_digit would reduce this digit in steps of 1. This is
+// slow.
 TEST(MpiModMpi, IsFastIfTheFirstSumEqualsTheDivisorsTopLimb) {
   const Number A({0x12345678, 0x0000abcd, 0x48000000});
   const Number B({0xfedcba98, 0x8000ffff});

@@ -122,8 +122,9 @@ TEST(MpiMontmul, SubtractsAlsoWhereTheProductIsBelowTheModulus) {
   Number T(Limbs(4));
   mpi_montmul(&A, &B, &N, 1, &T);
   EXPECT_EQ(15, Value(A));
-  // Limb 0 of T contained A's old limb, 3. Limb 1 contained the product, 15. The product was then
-  // subtracted from T. This left 3 - 15 in limb 0, and borrowed 1 from limb 1.
+  // After the multiplication, limb 0 of T contained 3, which was A's value, and limb 1 contained
+  // the product, 15. As the product is below N, mpi_montmul subtracted 15 from limb 0 of T. This
+  // borrowed 1 from limb 1.
   EXPECT_EQ(static_cast<uint32_t>(3 - 15), T.p[0]);
   EXPECT_EQ(14u, T.p[1]);
 }

@@ -72,8 +72,8 @@ def refusal_problems(repository):
     repository.commit(RELEASED.replace("4 May", "in preparation since 4 May").replace("3,", "4,", 1))
     repository.tag("v1.2.4", "--sign")
     for tag, reason in (("v1.2.3", "the tag v1.2.3 has no signature by a key that gpg knows"),
-                        ("v1.2.2", "the newest heading of CHANGES.md is '## 1.2.3, 4 May 2026', "
-                                   "not of 1.2.2"),
+                        ("v1.2.2", "the version is 1.2.2, but the newest heading of CHANGES.md is "
+                                   "'## 1.2.3, 4 May 2026'"),
                         ("v1.2.4", "CHANGES.md says that 1.2.4 is in preparation"),
                         ("v9", "the tag v9 has no signature by a key that gpg knows"),
                         ("1.2.3", "usage: scripts/release TAG, with a tag such as v1.2.3")):
