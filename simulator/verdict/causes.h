@@ -195,26 +195,26 @@ inline constexpr Cause kSignatureBlockMalformed = {"signature-block-malformed", 
 inline constexpr Cause kEcKey = {"ec-key", Group::kSignature, Severity::kRefused, ChainLink::kKey,
     "`Can't extract RSA certificate`, `Unknown certificate type`",
     "its key is an EC key, and this tool supports only RSA",
-    "Sign it with an RSA key of 2048 to 4096 bits. This makes another signer: phones refuse the "
-    "package as an update of a published app. Key rotation does not help: the JAR signature is "
+    "Sign it with an RSA key of 2048 to 4096 bits. This changes the signer, so phones cannot "
+    "update a published app with this package. Key rotation does not help: the JAR signature is "
     "still made with the first key."};
 inline constexpr Cause kDsaKey = {"dsa-key", Group::kSignature, Severity::kRefused, ChainLink::kKey,
     "`Can't extract RSA certificate`, `Unknown certificate type`",
     "its key is a DSA key, and this tool supports only RSA",
-    "Sign it with an RSA key of 2048 to 4096 bits. This makes another signer: phones refuse the "
-    "package as an update of a published app. Key rotation does not help: the JAR signature is "
+    "Sign it with an RSA key of 2048 to 4096 bits. This changes the signer, so phones cannot "
+    "update a published app with this package. Key rotation does not help: the JAR signature is "
     "still made with the first key."};
 inline constexpr Cause kKeyTooLarge = {"key-too-large", Group::kSignature, Severity::kRefused,
     ChainLink::kKey, "`RSA could not verify certificate`",
     "its RSA key has %s bits, and this tool accepts at most 4096",
-    "Sign it with an RSA key of 2048 to 4096 bits. This makes another signer: phones refuse the "
-    "package as an update of a published app. Key rotation does not help: the JAR signature is "
+    "Sign it with an RSA key of 2048 to 4096 bits. This changes the signer, so phones cannot "
+    "update a published app with this package. Key rotation does not help: the JAR signature is "
     "still made with the first key."};
 inline constexpr Cause kKeyTooSmall = {"key-too-small", Group::kSignature, Severity::kRefused,
     ChainLink::kKey, "`RSA could not verify certificate`",
     "its RSA key has %s bits, and this tool accepts at least 128",
-    "Sign it with an RSA key of 2048 to 4096 bits. This makes another signer: phones refuse the "
-    "package as an update of a published app. Key rotation does not help: the JAR signature is "
+    "Sign it with an RSA key of 2048 to 4096 bits. This changes the signer, so phones cannot "
+    "update a published app with this package. Key rotation does not help: the JAR signature is "
     "still made with the first key."};
 inline constexpr Cause kExponentRefused = {"exponent-refused", Group::kSignature,
     Severity::kRefused, ChainLink::kKey, "`RSA could not set key`",
@@ -225,15 +225,15 @@ inline constexpr Cause kCertificateIssued = {"certificate-issued", Group::kSigna
     "its certificate was issued by another subject (%s), and this tool accepts only self-signed "
     "certificates",
     "Sign it with a self-signed certificate: keytool -genkeypair -keyalg RSA -sigalg "
-    "SHA256withRSA. This makes another signer: phones refuse the package as an update of a "
-    "published app."};
+    "SHA256withRSA. This changes the signer, so phones cannot update a published app with this "
+    "package."};
 inline constexpr Cause kCertificateDigest = {"certificate-digest", Group::kSignature,
     Severity::kRefused, ChainLink::kCertificate, "`RSA could not verify certificate`",
     "its certificate is signed with %s, not RSA PKCS#1 v1.5 with MD5, SHA-1 or SHA-256",
     "Certify the same key with SHA-256, and sign again: keytool -selfcert -alias ALIAS -sigalg "
-    "SHA256withRSA -validity 10000 -keystore KEYSTORE. This makes another signer: phones refuse "
-    "the package as an update of a published app. Without -sigalg, keytool uses SHA-384: in JDK "
-    "21 for every RSA key, in JDK 17 for keys of more than 3072 bits."};
+    "SHA256withRSA -validity 10000 -keystore KEYSTORE. This changes the signer, so phones cannot "
+    "update a published app with this package. Without -sigalg, keytool uses SHA-384: in JDK 21 "
+    "for every RSA key, in JDK 17 for keys of more than 3072 bits."};
 inline constexpr Cause kCertificateChanged = {"certificate-changed", Group::kSignature,
     Severity::kRefused, ChainLink::kCertificate, "`RSA could not verify certificate`",
     "its certificate is not signed by its own key",
@@ -339,7 +339,7 @@ inline constexpr Cause kLibraryInPackage = {"library-in-package", Group::kLibrar
     "Nothing to do: it is loaded from the package."};
 inline constexpr Cause kLibraryNotInstalled = {"library-not-installed", Group::kLibrary,
     Severity::kAbsent, ChainLink::kNone, "`Can't open file`",
-    "no libraries for its ABI are beside the package", "If the phone uses another ABI, "
+    "no libraries for its ABI are beside the package", "If the phone does not use this ABI, "
     "there is nothing to do. To extract libraries for 32-bit and 64-bit Arm, use --install=all."};
 inline constexpr Cause kLibraryNotLaidOut = {"library-not-laid-out", Group::kLibrary,
     Severity::kNothing, ChainLink::kNone, "`Can't open file`",
@@ -440,7 +440,7 @@ inline constexpr Cause kForgeableKey = {"forgeable-key", Group::kWarning, Severi
     ChainLink::kNone, "", "the key has the public exponent %s: anyone can make its signatures",
     "Do not trust this package. Normal keys have the exponent 65537."};
 inline constexpr Cause kEntriesChanged = {"entries-changed", Group::kWarning, Severity::kWarning,
-    ChainLink::kNone, "", "%s: the content does not match the manifest; the tool does not check it",
+    ChainLink::kNone, "", "the manifest does not match %s, which the tool does not check",
     "Sign the package again, as the last step that changes it. If you did not build it, do not "
     "trust it."};
 inline constexpr Cause kEntriesMissing = {"entries-missing", Group::kWarning, Severity::kWarning,
@@ -454,18 +454,18 @@ inline constexpr Cause kEntriesNotCompared = {"entries-not-compared", Group::kWa
     "MiB are not compared."};
 inline constexpr Cause kWeakKey = {"weak-key", Group::kWarning, Severity::kWarning,
     ChainLink::kNone, "", "its RSA key has %s bits; fewer than 2048 bits are not safe",
-    "Sign a new app with a key of 2048 bits or more. For a published app, a new key makes "
-    "another signer."};
+    "Sign a new app with a key of 2048 bits or more. For a published app, a new key changes "
+    "the signer."};
 inline constexpr Cause kDebugKey = {"debug-key", Group::kWarning, Severity::kWarning,
     ChainLink::kNone, "", "it is signed with a debug certificate (CN=Android Debug); each "
     "workstation makes its own debug key", "Sign a release with a release key."};
 inline constexpr Cause kWeakDigest = {"weak-digest", Group::kWarning, Severity::kWarning,
     ChainLink::kNone, "", "SHA-1 or MD5 is in use: %s",
     "Sign it again with SHA-256 (apksigner --min-sdk-version 18). Certify the key of a new app "
-    "with SHA-256 as well; for a published app, a new certificate makes another signer."};
+    "with SHA-256 as well; for a published app, a new certificate changes the signer."};
 inline constexpr Cause kCertificateExpired = {"certificate-expired", Group::kWarning,
     Severity::kWarning, ChainLink::kNone, "", "its certificate expired on %s",
-    "Phones still install it. A published app must keep its certificate: a new one makes another "
+    "Phones still install it. A published app must keep its certificate: a new one changes the "
     "signer. For a new app, make a certificate that lasts: keytool -validity 10000."};
 inline constexpr Cause kUnlistedEntries = {"unlisted-entries", Group::kWarning, Severity::kWarning,
     ChainLink::kNone, "", "the signature does not protect %s: no digest in the manifest",
@@ -475,7 +475,7 @@ inline constexpr Cause kNotLaidOut = {"not-laid-out", Group::kWarning, Severity:
     "Build the package again with its libraries as lib/ABI/NAME."};
 inline constexpr Cause kCertificateOtherKey = {"certificate-other-key", Group::kWarning,
     Severity::kAlarm, ChainLink::kNone, "",
-    "other programs do not find the key that the tool reads in its certificate: they find %s",
+    "its certificate shows this tool a key that other programs do not find: they find %s",
     "If you did not build this package, do not trust it."};
 inline constexpr Cause kBlockAmbiguous = {"block-ambiguous", Group::kWarning, Severity::kAlarm,
     ChainLink::kNone, "",

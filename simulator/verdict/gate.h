@@ -31,10 +31,10 @@ class Gate {
 
   // Adds at least one item to the report for each demand that the file does not meet. A good
   // verdict, which is a verdict with the status kAllSigned (StatusOf), then becomes kNotAccepted.
-  // The demand for no warnings is made only if the verdict was good when Judge was called. For this
-  // demand, the verdict kOtherSigner is a warning. Changes nothing for a file that was not looked
-  // at or not simulated. Must be called once per file, in the order of the command line, because
-  // each verified package is compared with the first verified package of the same name.
+  // The demand for no warnings is made only if the verdict was good when Judge was called. A file
+  // with the good verdict kOtherSigner never meets this demand. Changes nothing for a file that was
+  // not looked at or not simulated. Must be called once per file, in the order of the command line,
+  // because each verified package is compared with the first verified package of the same name.
   void Judge(Report* report);
 
  private:

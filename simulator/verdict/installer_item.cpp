@@ -69,9 +69,9 @@ const CertificateFacts* OtherSigner(const Judgement& judgement, const Report& re
 
 namespace {
 
-// The API levels of the phones that install the package, such as "API 27 to 29" or "API 27 and of
-// API 30 and later". If `is_verified` is false, the API levels of the phones that refuse the
-// package.
+// The API levels of the phones that install the package. If `is_verified` is false, the API levels
+// of the phones that refuse the package. The text continues a text that ends in "of": (phones of)
+// "API 27 to 29", (phones of) "API 27 and of API 30 and later".
 std::string LevelsText(const std::vector<RangeJudgement>& ranges, bool is_verified) {
   std::vector<LevelRange> levels;
   for (const RangeJudgement& range : ranges) {

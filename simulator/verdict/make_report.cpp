@@ -234,8 +234,9 @@ Verdict JudgeWithInstaller(Verdict verdict, const Report& report) {
 
 // Fills in the payload, the package's name, the signers, the schemes and the key. The payload is
 // that of the signed file itself, or else of the first signed library. Only the report of a package
-// can have a key: the key whose digest is in the payload. If the payload has no digest, or if
-// nothing was signed, the report has the key that the tool's own code reads from the package.
+// can have a key. If the payload has a digest, the key is the one with this digest. If the payload
+// has no digest, or if nothing was signed, the key is the one that the tool's own code reads from
+// the package.
 void DescribeSigners(const RunRecord& run, const PackageFacts& facts, Report* report) {
   constexpr char kDigestFollows[] = "2000";  // the digest's length, 32, the low byte first
   const auto take = [report](const Attempt& attempt) {

@@ -28,8 +28,8 @@ std::string FirstSignatureFile(const JarSignatureFacts& jar);
 
 // The first of these facts decides: an encrypted entry (WhyEncrypted), a refused classes.dex, the
 // first log line that names a failed check. The log has the checks in the order in which the tool
-// makes them. kTextMalformed does not name the malformed file. If no other line names a failed
-// check, the malformed file is the signature file.
+// makes them. A log line with the meaning kTextMalformed does not name the malformed file. If no
+// other line names a failed check, the malformed file is the signature file.
 Reason WhyRefused(const RunRecord& run, const PackageFacts& facts) {
   const Lines& errors = run.opening_errors;
   const JarSignatureFacts& jar = facts.jar;

@@ -62,8 +62,8 @@ struct Reason {
 struct Item {
   ItemKind kind;
   std::string name;   // of a library: its path below the package's directory, or else its entry;
-                      // of a key: the package or JAR in its registration; empty if libzu was
-                      // not asked
+                      // of a key: the package's name or the JAR's path, under which it is
+                      // registered; empty if libzu was not asked
   std::string entry;  // of a library: its entry in the package
   ItemState state;
   Reason reason;  // a null cause if the state is kDone

@@ -78,7 +78,7 @@ TEST_F(Reason, LibrariesMissingBesideThePackageAreReported) {
   EXPECT_EQ(Told(7),
             Lines({"SIGNED  base.apk" + ByRsa2048(), kSigned,
                    "  – lib/arm64/libvault.so  " + absent, "  – lib/arm/libvault.so    " + absent,
-                   "      If the phone uses another ABI, there is nothing to do. To extract",
+                   "      If the phone does not use this ABI, there is nothing to do. To extract",
                    "      libraries for 32-bit and 64-bit Arm, use --install=all.",
                    "  ✓ key                    registered for com.example.vault", "-> 0"}));
   EXPECT_EQ(Told(1, {"--strict"}), Lines({"PARTLY SIGNED  base.apk", "-> 1"}));

@@ -52,27 +52,30 @@ TEST_F(Reason, CertificateOfAnotherIssuerIsReported) {
              "subject (CN=rsa-2048, O=Example), and this tool accepts only self-signed "
              "certificates",
              "      Sign it with a self-signed certificate: keytool -genkeypair -keyalg RSA",
-             "      -sigalg SHA256withRSA. This makes another signer: phones refuse the", "-> 1"}));
+             "      -sigalg SHA256withRSA. This changes the signer, so phones cannot update a",
+             "-> 1"}));
 }
 
 TEST_F(Reason, EcKeyIsReported) {
   Take("apksigner-ec");
-  EXPECT_EQ(Told(3),
-            Lines({"REFUSED  base.apk",
-                   "  ✗ package                not signed: its key is an EC key, and this tool "
-                   "supports only RSA",
-                   "      Sign it with an RSA key of 2048 to 4096 bits. This makes another signer:",
-                   "-> 1"}));
+  EXPECT_EQ(
+      Told(3),
+      Lines({"REFUSED  base.apk",
+             "  ✗ package                not signed: its key is an EC key, and this tool "
+             "supports only RSA",
+             "      Sign it with an RSA key of 2048 to 4096 bits. This changes the signer, so",
+             "-> 1"}));
 }
 
 TEST_F(Reason, KeyOfMoreThan4096BitsIsReported) {
   Take("apksigner-5120");
-  EXPECT_EQ(Told(3),
-            Lines({"REFUSED  base.apk",
-                   "  ✗ package                not signed: its RSA key has 5120 bits, and this "
-                   "tool accepts at most 4096",
-                   "      Sign it with an RSA key of 2048 to 4096 bits. This makes another signer:",
-                   "-> 1"}));
+  EXPECT_EQ(
+      Told(3),
+      Lines({"REFUSED  base.apk",
+             "  ✗ package                not signed: its RSA key has 5120 bits, and this "
+             "tool accepts at most 4096",
+             "      Sign it with an RSA key of 2048 to 4096 bits. This changes the signer, so",
+             "-> 1"}));
 }
 
 TEST_F(Reason, DsaKeyIsReported) {
@@ -82,17 +85,16 @@ TEST_F(Reason, DsaKeyIsReported) {
      "apksigner sign --ks key.p12 --ks-pass pass:android --v1-signer-name CERT "
      "--min-sdk-version 21 --in " +
      std::string(GOLDEN_PACKAGES) + "/unsigned.apk --out base.apk");
-  EXPECT_EQ(Told(3),
-            Lines({"REFUSED  base.apk",
-                   "  ✗ package                not signed: its key is a DSA key, and "
-                   "this tool supports only RSA",
-                   "      Sign it with an RSA key of 2048 to 4096 bits. This makes another "
-                   "signer:",
-                   "-> 1"}));
+  EXPECT_EQ(Told(3), Lines({"REFUSED  base.apk",
+                            "  ✗ package                not signed: its key is a DSA key, and "
+                            "this tool supports only RSA",
+                            "      Sign it with an RSA key of 2048 to 4096 bits. This changes the "
+                            "signer, so",
+                            "-> 1"}));
 }
 
-// The cure is the advice below the reason. This cure states its own disadvantage: the package gets
-// another signer.
+// The cure is the advice below the reason. This cure states its own disadvantage: the signer
+// changes.
 TEST_F(Reason, CureByAnotherKeyStatesItsDisadvantage) {
   for (const char* name : {"apksigner-ec", "apksigner-5120"}) {
     Do("rm -rf -- *");
@@ -100,9 +102,9 @@ TEST_F(Reason, CureByAnotherKeyStatesItsDisadvantage) {
     const Lines told = Told(kAll);
     ASSERT_GT(told.size(), 5U);
     EXPECT_EQ(told[2] + told[3] + told[4],
-              "      Sign it with an RSA key of 2048 to 4096 bits. This makes another signer:"
-              "      phones refuse the package as an update of a published app. Key rotation"
-              "      does not help: the JAR signature is still made with the first key.")
+              "      Sign it with an RSA key of 2048 to 4096 bits. This changes the signer, so"
+              "      phones cannot update a published app with this package. Key rotation does"
+              "      not help: the JAR signature is still made with the first key.")
         << name;
   }
 }
@@ -113,13 +115,14 @@ TEST_F(Reason, CureByAnotherKeyStatesItsDisadvantage) {
 TEST_F(Reason, CertificateSignedWithSha384IsReported) {
   Take("keytool-sha384");
   const Lines told = Told(5);
-  EXPECT_EQ(Lines(told.begin() + 1, told.end()),
-            Lines({"  ✗ package                not signed: its certificate is signed with "
-                   "SHA384withRSA, not RSA PKCS#1 v1.5 with MD5, SHA-1 or SHA-256",
-                   "      Certify the same key with SHA-256, and sign again: keytool -selfcert",
-                   "      -alias ALIAS -sigalg SHA256withRSA -validity 10000 -keystore KEYSTORE.",
-                   "      This makes another signer: phones refuse the package as an update of a",
-                   "-> 1"}));
+  EXPECT_EQ(
+      Lines(told.begin() + 1, told.end()),
+      Lines({"  ✗ package                not signed: its certificate is signed with "
+             "SHA384withRSA, not RSA PKCS#1 v1.5 with MD5, SHA-1 or SHA-256",
+             "      Certify the same key with SHA-256, and sign again: keytool -selfcert",
+             "      -alias ALIAS -sigalg SHA256withRSA -validity 10000 -keystore KEYSTORE.",
+             "      This changes the signer, so phones cannot update a published app with this",
+             "-> 1"}));
   EXPECT_EQ(FirstLines(0, {"base.apk"}, {{}, std::string(GOLDEN_PACKAGES) + "/keytool-sha256"}),
             Lines({"-> 0"}));
 }

@@ -184,7 +184,8 @@ TEST(PackageReadInTwoWays, VictimsKeyIsNotShownIfExponentSetsModulusLength) {
   ExpectKey(told, digest);
   EXPECT_TRUE(Has(told.head, "SIGNED  base.apk   com.example.app   signer CN=Test, RSA-2400, key "))
       << told.head;
-  EXPECT_TRUE(Has(told.head, "   ! other programs do not find the key that the tool reads "));
+  EXPECT_TRUE(Has(told.head,
+                  "   ! its certificate shows this tool a key that other programs do not find: "));
   EXPECT_EQ(told.Warnings(), Codes({"certificate-other-key"}));
   for (const std::string& all : {told.head, told.text, told.page, told.verdict.dump()}) {
     EXPECT_FALSE(Has(all, VictimsDigest().substr(0, 8))) << all;
@@ -197,7 +198,8 @@ TEST(PackageReadInTwoWays, TwoZerosBeforeTheModulusMakeAnotherKey) {
   EXPECT_EQ(told.status, 0);
   ASSERT_NE(digest, VictimsDigest());
   ExpectKey(told, digest);
-  EXPECT_TRUE(Has(told.head, "   ! other programs do not find the key that the tool reads "));
+  EXPECT_TRUE(Has(told.head,
+                  "   ! its certificate shows this tool a key that other programs do not find: "));
   EXPECT_EQ(told.Warnings(), Codes({"certificate-other-key"}));
 }
 
@@ -214,7 +216,7 @@ TEST(PackageReadInTwoWays, CertificateWithA5ByteExponentShowsAnotherKey) {
   const Told told(MakePackage(options));
   EXPECT_EQ(told.status, 1);
   EXPECT_TRUE(Has(told.head,
-                  "   ! other programs do not find the key that the tool reads in its certificate: "
+                  "   ! its certificate shows this tool a key that other programs do not find: "
                   "they find a modulus with the SHA-256 digest " +
                       VictimsDigest()))
       << told.head;

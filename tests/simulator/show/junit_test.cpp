@@ -70,7 +70,7 @@ TEST(Junit, HasACaseForEachFileAndCountsThem) {
           "testcase [('classname', 'apktoolkit-sim'), ('name', 'd.apk')] ''\n"
           "system-out [] 'warning: its RSA key has 1024 bits; fewer than 2048 bits are not safe\\n"
           "    Sign a new app with a key of 2048 bits or more. For a published "
-          "app, a new key makes another signer.'\n");
+          "app, a new key changes the signer.'\n");
 }
 
 TEST(Junit, SaysThatTheInstallerWasNotAsked) {

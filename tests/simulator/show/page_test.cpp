@@ -408,10 +408,11 @@ TEST(Page, KeepsOptionsOnOneLine) {
   Report report = Example(Verdict::kSigned);
   report.items = {Library("a", &cause::kLibraryNotInstalled)};
   report.items[0].state = ItemState::kAbsent;
-  EXPECT_TRUE(Has(PageOf(report),
-                  "<p class=\"cure\">If the phone uses another ABI, there is nothing to do. To "
-                  "extract libraries for 32-bit and 64-bit Arm, use <span "
-                  "class=\"option\">--install=all</span>.</p>"));
+  EXPECT_TRUE(
+      Has(PageOf(report),
+          "<p class=\"cure\">If the phone does not use this ABI, there is nothing to do. To "
+          "extract libraries for 32-bit and 64-bit Arm, use <span "
+          "class=\"option\">--install=all</span>.</p>"));
   EXPECT_TRUE(Has(PageOf(report), ".option { white-space: nowrap; }"));
   report.items = {Library("a", &cause::kUnsigned)};
   EXPECT_TRUE(Has(PageOf(report),

@@ -70,7 +70,7 @@ TEST(Sarif, HasTheWholeRun) {
          "defaultConfiguration": {"level": "error"}},
         {"id": "weak-key",
          "shortDescription": {"text": "its RSA key has … bits; fewer than 2048 bits are not safe"},
-         "help": {"text": "Sign a new app with a key of 2048 bits or more. For a published app, a new key makes another signer."},
+         "help": {"text": "Sign a new app with a key of 2048 bits or more. For a published app, a new key changes the signer."},
          "defaultConfiguration": {"level": "warning"}}]}},
       "invocations": [{"executionSuccessful": true}],
       "artifacts": [
