@@ -1,6 +1,7 @@
 #!/usr/bin/env python3
-"""Checks names in the docs. The named tests, the linked files, and the files and functions that
-docs/architecture.md names must exist. Also checks how the names of tests begin."""
+"""Checks names in the docs. The tests that the docs name and the files to which they link must
+exist, and in docs/architecture.md also the named files and functions. Also checks how the names of
+tests begin."""
 
 import re
 import sys

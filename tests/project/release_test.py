@@ -1,9 +1,9 @@
 #!/usr/bin/env python3
 """Compares debian/changelog with CHANGES.md. With --write as the first argument, rewrites
 debian/changelog instead. In both cases, runs scripts/release with good and bad tags in a new
-repository. In this repository, stand-ins replace scripts/setup and scripts/reproducible. The
-stand-ins install nothing and build no real packages. The last argument is the build's version. The
-newest heading of CHANGES.md must have this version.
+temporary repository. There, stand-ins replace scripts/setup and scripts/reproducible. The stand-ins
+install nothing and build no real packages. The last argument is the build's version. The newest
+heading of CHANGES.md must have this version.
 """
 
 import os

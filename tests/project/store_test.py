@@ -1,7 +1,8 @@
 #!/usr/bin/env python3
 """Runs the commands of docs/store.md over a few hundred packages on this machine. Kills all jobs
 in the middle, and continues the work. The journals must then have the verdict on each package
-exactly once. A journal that was cut off must not get the name of its list of packages.
+exactly once. The name of a whole journal is that of its list of packages. A journal that was cut
+off must not get this name.
 
 Arguments: the directory of the golden packages, and the command line that starts apktoolkit-sim.
 """

@@ -14,6 +14,6 @@ int main() {
     }
     m0 += 2;
   } while (m0 != 1);
-  printf("proved: montgomery constant is minus the inverse of every odd limb\n");
+  printf("proved: for each odd limb, montgomery constant is minus the limb's inverse\n");
   return 0;
 }

@@ -87,8 +87,8 @@ def half_digit_is_quotient_and_remainder():
         return function(place, half, d), place[0]
 
     Word.quotient, Word.product = quotient, product
-    # The dividend is rest * 2^16 + half. The dividend minus estimate * d is left * 2^16 + half -
-    # to_take.
+    # The dividend is `rest * 2^16 + half`. If `estimate * d` is subtracted from it, the difference
+    # is `left * 2^16 + half - to_take`.
     difference = (wide(left) << 16) + wide(half) - wide(to_take)
     for holds, (digit, remainder) in Runs(run, given):
         less = wide(estimate) - wide(digit)

@@ -102,7 +102,7 @@ class ChangedLibrary : public testing::Test {
     return count;
   }
 
-  // Makes each fstat of the descriptor to sign fail after this number of digests.
+  // After this number of digests, each fstat of the descriptor that is to be signed fails.
   void FailStateAfter(int digests) {
     file_.phone.fstat_error = [this, digests](int) { return digests_ == digests ? EIO : 0; };
   }
