@@ -43,5 +43,6 @@ std::string LibraryStep(std::initializer_list<std::string> libraries = {});
 std::string SignedLibrary(const std::string& path, const Bytes& payload = PackagePayload());
 // The events of VeltSign, the step that signs the package file, for a good package.
 std::string PackageStep(const std::string& path, const Bytes& payload = PackagePayload());
-// The events of VeltSignJni and VeltSign for a package that the tool refused before VeltSignJni.
+// The events of VeltSignJni and VeltSign for a package that the tool refused before. Both steps run
+// nevertheless.
 std::string NothingSigned(const std::string& path);

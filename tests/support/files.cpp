@@ -91,7 +91,7 @@ MemoryFile::MemoryFile(const Bytes& content, const std::string& name)
 MemoryFile::~MemoryFile() { close(fd_); }
 
 // Keeps the file of descriptor `fd` open under the number 100 + fd. dup() would choose the lowest
-// free number, which another FreeDescriptor may have to keep free.
+// unused number. Another FreeDescriptor may have closed this number, and it must stay unused.
 FreeDescriptor::FreeDescriptor(int fd) : fd_(fd), kept_(dup2(fd, 100 + fd)) { close(fd); }
 
 FreeDescriptor::~FreeDescriptor() {

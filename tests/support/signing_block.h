@@ -2,8 +2,8 @@
 // v3, v3.1), with one function for each layer. The block is a list of pairs of scheme and value,
 // between an archive's entries and its central directory. It protects the entries of META-INF like
 // all other entries. Numbers are little-endian. The size of the block and the length before each of
-// its pairs have 64 bits. Inside a pair's value, every list and element has a length of 32 bits
-// before it.
+// its pairs have 64 bits. Inside a pair's value, a length field of 32 bits stands before every list
+// and every element.
 #pragma once
 
 #include <cstdint>
