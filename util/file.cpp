@@ -58,8 +58,9 @@ bool ReadFile(const std::string& path, std::vector<uint8_t>& out, struct stat* s
   if (out.empty() && out.capacity() < static_cast<size_t>(size)) std::vector<uint8_t>().swap(out);
   out.resize(static_cast<size_t>(size));
   // Deliberate: reading succeeds even if the file shrinks meanwhile. The end of `out` then keeps
-  // its old bytes, or is 0. The digest of `out` can therefore be right although the file shrank.
-  // SignLibrary (sign/signing.cpp) therefore also compares `state` with the file's later state.
+  // its old bytes, or is 0. These can be the same bytes as those that the file lost, and the digest
+  // of `out` is then right. SignLibrary (sign/signing.cpp) therefore also compares `state` with the
+  // file's later state.
   ReadBytes(fd, out);
   if (state != nullptr) *state = found;
   return true;

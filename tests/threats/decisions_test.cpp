@@ -28,10 +28,11 @@ Bytes WithForgedBlock(const Bytes& exponent) {
 }
 
 // The tool reads an exponent's first four bytes in host byte order. For each exponent in this test,
-// the result is 1 or -1. If an exponent is shorter, the tool reads the missing bytes as 0. Bytes 5
-// to 8 of a longer exponent overwrite the length of the modulus: 256, which is stored as the bytes
-// 00 01 00 00. In this test, bytes 5 to 8 equal the bytes that they overwrite, so that the length
-// does not change.
+// the result is 1 or -1. If an exponent is shorter, the tool reads the missing bytes as 0. The
+// fifth byte of a longer exponent overwrites the first byte of the modulus length, the sixth byte
+// overwrites the second byte, and so on up to the eighth byte. The length is 256, which is stored
+// as the bytes 00 01 00 00. The exponents of this test overwrite each of these bytes with the same
+// value, so that the length does not change.
 TEST(Threat, ExponentReadAsOneOrMinusOneIsRefused) {
   for (const char* exponent :
        {"01", "01 00", "01 00 00", "01 00 00 00", "FF FF FF FF", "01 00 00 00 00 01",

@@ -48,7 +48,8 @@ class Device {
     return FilesSignedWith(payload);
   }
 
-  // Like FilesSignedFor, for each payload that begins with the hexadecimal digits `payload`.
+  // Like FilesSignedFor, but counts the requests whose payload begins with the hexadecimal digits
+  // `payload`.
   Strings FilesSignedWith(const std::string& payload) {
     Strings files;
     phone.witness = [&](int fd, const std::string& event) {

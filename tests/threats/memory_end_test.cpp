@@ -105,8 +105,8 @@ TEST(EntryDigestsAtMemoryEnd, AreSortedWithoutAccessBeyondTheTable) {
 }
 
 // In the first section, the table is sorted for the first time when a new attribute's name starts
-// at offset 1024 of the text or later. Here, this is the 33rd attribute (32 * 32 = 1024), which
-// also fills the table.
+// at offset 1024 of the text or later. Each attribute of this test takes 32 bytes of text, so the
+// 33rd attribute starts at offset 1024. The 33rd attribute also fills the table.
 TEST(ManifestSectionsAtMemoryEnd, AreNotReadBeyondTheLastAttribute) {
   constexpr uint32_t kAttributes = 33;
   std::string text;

@@ -103,8 +103,8 @@ TEST(OwnMetaInf, GetsItsOwnPayload) {
 // ---- The tool compares only the local names of attributes.
 
 // The tool reads the package's name from the attribute "x:package". The installer reads the name
-// from the attribute "package". The tool registers the key although the Android manifest declares
-// the permission (<permission>) but does not request it (<uses-permission>).
+// from the attribute "package". The Android manifest only declares the permission (<permission>).
+// The tool registers the key although no <uses-permission> requests the permission.
 TEST(AttributeInAnotherNamespace, NamesAnotherPackageThanTheInstallerReads) {
   const std::string apk = Made("attribute");
   const ProcessResult installer = RunProcess({"aapt", "dump", "permissions", apk});

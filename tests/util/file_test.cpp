@@ -384,8 +384,8 @@ TEST(IsSameFile, EachPartOfTheStateCounts) {
   }
 }
 
-// Each state is compared with itself. IsSameFile returns false, because neither state is the state
-// of a regular file.
+// The test compares two states, each with itself. IsSameFile returns false for both, because
+// neither is the state of a regular file.
 TEST(IsSameFile, FilesThatAreNotRegularAreNotTheSame) {
   struct stat state = {};
   EXPECT_FALSE(IsSameFile(state, state));
