@@ -108,7 +108,7 @@ TEST(RunProgram, ProgramHasNoDescriptorsAboveTheLimit) {
   EXPECT_EQ(descriptors, "0\n1\n2\n3\n");
 }
 
-// More descriptors than one system call lists.
+// One system call that reads /proc/self/fd cannot list all of these descriptors.
 TEST(RunProgram, ProgramHasNoneOfVeryManyDescriptors) {
   std::vector<int> inherited(500);
   for (int& fd : inherited) fd = dup(STDIN_FILENO);

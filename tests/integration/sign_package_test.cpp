@@ -34,8 +34,8 @@ class Phone : public testing::Test {
     return "exec '" + SimulatorPath() + "' --state '" + (data_ / "signed") + "' " + options;
   }
 
-  // Installs a package of make_golden_packages. In the result, the package's JAR signer is the only
-  // signer that the package manager knows.
+  // Installs a package of make_golden_packages. In the returned InstalledPackage, the package's JAR
+  // signer is the only signer that the package manager knows.
   InstalledPackage Install(const std::string& name) const {
     fs::copy(Golden(name), data_ / name, fs::copy_options::recursive);
     return {data_ / (name + "/base.apk"), ContentOf(Golden(name) + "/digest").substr(0, 64)};

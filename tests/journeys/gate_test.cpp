@@ -56,8 +56,9 @@ ProcessResult Simulated(const Lines& words) {
   return RunProcess(command);
 }
 
-// The verdict of each file, then the simulator's exit status as "-> STATUS". The phone's installer
-// is asked only if `words` contain another --installer option.
+// The verdict of each file, then the simulator's exit status as "-> STATUS". Runs the simulator
+// with
+// --installer=off, which an --installer option in `words` replaces.
 Lines Verdicts(Lines words) {
   words.insert(words.begin(), {"--installer=off", "--quiet"});
   const ProcessResult run = Simulated(words);

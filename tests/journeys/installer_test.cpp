@@ -213,7 +213,7 @@ TEST(Installer, RefusesAV3SignerWithoutALineageFromTheV2Signer) {
 }
 
 // Older versions of apksig do not know v3.1, and would name the first key for all phones. The
-// verdict for all phones together must differ from SIGNED for every version of apksig. Phones of
+// verdict for all phones together must not be SIGNED, whichever version apksig has. Phones of
 // API 27 to 32 do not use this package's v3.1 signature. The verdict for them alone is SIGNED.
 TEST(Installer, SignerOfSchemeV31IsNotSkipped) {
   const ProcessResult run = RunProcess(

@@ -39,8 +39,8 @@ class ManyFiles : public testing::Test {
     return RunProcess(command, directory_.path());
   }
 
-  // Each line of the output up to the first place with three blanks in a row, then the exit status,
-  // then the text on standard error, if any.
+  // The lines of the output, then the exit status, then the text on standard error, if any. Each
+  // line of the output is cut at its first three blanks in a row.
   static Lines Told(const ProcessResult& run) {
     Lines lines;
     std::istringstream text(run.output);

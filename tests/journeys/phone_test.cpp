@@ -42,7 +42,8 @@ std::string Refusal(const std::string& kernels_part, int error) {
 }
 
 // The events of VeltSignJni and VeltSign if both attempts to sign fail: first the library, then the
-// package. `library_part` and `package_part` are the arguments `kernels_part` of Refusal.
+// package. Refusal gets `library_part` as its `kernels_part` for the library, and `package_part`
+// for the package.
 std::string BothRefused(const std::string& library_part, const std::string& package_part,
                         int error) {
   return Timeline({LibraryStep({Refusal(library_part, error)}),

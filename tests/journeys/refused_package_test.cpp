@@ -42,8 +42,8 @@ class RefusedPackage : public testing::Test {
   }
 
   // VeltSignJni, the first step, refuses the dex file and logs `reasons`. The tool has already read
-  // that the package asks for the permission, so the last step, the registration, also logs an
-  // error.
+  // that the package asks for the permission. The last step therefore tries to register the key. It
+  // also logs an error, because the package was refused.
   void ExpectDexFileRefusedAfter(std::initializer_list<std::string> reasons) const {
     const Simulation run = Run();
     EXPECT_EQ(
@@ -177,9 +177,10 @@ TEST_F(TamperedPackage, SecondDexFileIsNotLookedAt) {
 TEST_F(TamperedPackage, CertificateOfAnotherIssuerIsRefused) {
   package_ = MakePackage([] {
     PackageOptions options = Options();
-    // The issuer's modulus is smaller than the subject's modulus. The issuer's signature is
-    // therefore a number below the subject's modulus, and the tool refuses the padding and logs 7.
-    // If the signature were not below the subject's modulus, the tool would log 5.
+    // The tool checks the certificate's signature with the subject's key, although the issuer's key
+    // made it. The issuer's modulus is smaller than the subject's modulus, so the signature is a
+    // number below the subject's modulus. The tool then refuses the padding and logs 7. If the
+    // signature were not below the subject's modulus, the tool would log 5.
     options.block.key = "rsa-2048-other";
     options.block.issuer_key = "rsa-2048";
     return options;
