@@ -71,7 +71,7 @@ namespace {
 
 // The API levels of the phones that install the package. If `is_verified` is false, the API levels
 // of the phones that refuse the package. The text continues a text that ends in "of": (phones of)
-// "API 27 to 29", (phones of) "API 27 and of API 30 and later".
+// "API 27 to 29", (phones of) "API 27 and those of API 30 and later".
 std::string LevelsText(const std::vector<RangeJudgement>& ranges, bool is_verified) {
   std::vector<LevelRange> levels;
   for (const RangeJudgement& range : ranges) {
@@ -84,7 +84,9 @@ std::string LevelsText(const std::vector<RangeJudgement>& ranges, bool is_verifi
     }
   }
   std::string text;
-  for (const LevelRange& each : levels) text += (text.empty() ? "" : " and of ") + LevelText(each);
+  for (const LevelRange& each : levels) {
+    text += (text.empty() ? "" : " and those of ") + LevelText(each);
+  }
   return text;
 }
 

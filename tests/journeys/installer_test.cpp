@@ -191,8 +191,8 @@ TEST(Installer, SignerOnlyForLaterPhonesIsFound) {
   EXPECT_EQ(told.front(), "NOT INSTALLABLE");
   // The reason is not compared, because it depends on the version of apksig.
   EXPECT_EQ(told[1].substr(0, told[1].find("refuse it: ")),
-            "not all phones install it: those of API 27 and of API 30 and later do, but those of "
-            "API 28 to 29 ");
+            "not all phones install it: those of API 27 and those of API 30 and later do, but "
+            "those of API 28 to 29 ");
   EXPECT_EQ(told.back(), "-> 1");
   EXPECT_EQ(Told("later-v3", {"--api", "27"}),
             Lines({"SIGNED", "phones of API 27 install it, verified by v2", "-> 0"}));

@@ -74,7 +74,7 @@ TEST(InstallerItem, SaysWhichPhonesInstallThePackage) {
   EXPECT_EQ(Told(Judged({Refused(27, 27, kFault), Taken(28, 29), Refused(30, 32, kFault),
                          Refused(33, 33, kFault)})),
             "not-installable-on-some: not all phones install it: those of API 28 to 29 do, but "
-            "those of API 27 and of API 30 to 33 refuse it: a fault of x (A_FAULT)");
+            "those of API 27 and those of API 30 to 33 refuse it: a fault of x (A_FAULT)");
 }
 
 TEST(InstallerItem, NamesTheEntry) {
