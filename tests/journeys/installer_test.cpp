@@ -19,8 +19,9 @@ using nlohmann::json;
 // The path of `name` in the directory of the packages that make_golden_packages makes.
 std::string Golden(const std::string& name) { return std::string(GOLDEN_PACKAGES) + "/" + name; }
 
+// --timeout gives the verifier, a Java program, enough time on a busy machine.
 ProcessResult Run(const std::string& name, Lines options) {
-  options.insert(options.begin(), {"env", "LC_ALL=C.UTF-8", SimulatorPath()});
+  options.insert(options.begin(), {"env", "LC_ALL=C.UTF-8", SimulatorPath(), "--timeout", "300"});
   options.emplace_back("base.apk");
   return RunProcess(options, Golden(name));
 }
