@@ -262,9 +262,8 @@ void AddGate(CLI::App* app, Options* options) {
       ->check(is_digest)
       ->allow_extra_args(false);
   app->add_flag("--werror", options->gate.refuses_warnings,
-                "Warnings count as refusals. A package is also\n"
-                "refused if phones install it as signed by a\n"
-                "signer other than the JAR signer");
+                "Warnings count as refusals, and so does the\n"
+                "verdict SIGNED, OTHER SIGNER");
 }
 
 void AddOutput(CLI::App* app, Options* options) {

@@ -135,8 +135,10 @@ void AddItems(const Report& report, data* file) {
                   {"cures", has_cure ? list{{"cure", Pieces(item.reason.cause->cure)}} : list()}};
   };
   const auto refused = static_cast<uint64_t>(std::count_if(items.begin(), items.end(), is_refused));
-  AddLines("items", items, Counted(refused, "of all items is refused", "of all items are refused"),
-           make, file);
+  AddLines(
+      "items", items,
+      Counted(refused, "item of the whole list is refused", "items of the whole list are refused"),
+      make, file);
 }
 
 void AddPicture(const Report& report, data* file) {

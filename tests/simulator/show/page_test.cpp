@@ -157,7 +157,7 @@ TEST(Page, StaysBelow2MebibytesForALargeReport) {
   report.events = ParseEvents(journal);
   const std::string page = PageOf(report);
   EXPECT_LT(page.size(), 2U << 20);
-  EXPECT_TRUE(Has(page, "<p class=\"more\">59,800 more; 1 of all items is refused</p>"));
+  EXPECT_TRUE(Has(page, "<p class=\"more\">59,800 more; 1 item of the whole list is refused</p>"));
   EXPECT_EQ(Count(page, "<p class=\"more\">59,800 more</p>"), 1U);
   EXPECT_TRUE(Has(page, "<p class=\"more\">59,800 more; the journal has them all</p>"));
   EXPECT_EQ(Count(page, "<li class=\"bad\"><span class=\"mark bad\""), 1U)
