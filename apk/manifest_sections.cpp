@@ -59,9 +59,10 @@ void ManifestSections::reset(const uint8_t* text, size_t size) {
 
 // Sorts the open section if the new attribute starts at or after the offset next_sort_. The sort
 // drops repeated names, which could otherwise fill the table. Each sort compares all names of the
-// section. To save time, the next sort is delayed by kLittleText bytes of text, and by the length
-// and kTwoAttributes more bytes of each name that is still in the section. kTwoAttributes is the
-// length of two short attributes, such as "A: b", with their line ends.
+// section. To save time, the next sort waits for more text: at least kLittleText bytes. For each
+// name that is still in the section, it also waits for as many bytes as the name has, and for
+// kTwoAttributes more. kTwoAttributes is the length of two short attributes, such as "A: b", with
+// their line ends.
 void ManifestSections::add(const ManifestAttribute& attribute) {
   constexpr size_t kTwoAttributes = 10;
   attributes_.push_back(attribute);

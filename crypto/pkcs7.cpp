@@ -171,8 +171,8 @@ bool ReadSigner(const Block& block, const asn1_hdr& certificates, pkcs7* record)
   // are not checked. If a SignerInfo has authenticated attributes, its digestEncryptionAlgorithm is
   // read as the encryptedDigest, and the package is then refused. The refusal is intended: the
   // encryptedDigest of such a SignerInfo signs the attributes, not the signature file. `bound` is
-  // the offset of the first of the two elements. It is also used as the limit of length, in bytes,
-  // of each of the two elements, header included.
+  // the offset of the first of the two elements. Each of the two elements, header included, may
+  // have at most `bound` bytes.
   const size_t bound = block.Skip(algorithm);
   asn1_hdr encryption, digest;
   if (!block.Read(bound, bound, &encryption) ||

@@ -41,7 +41,7 @@ struct LibraryFacts {
   // Empty if no prefix in kLibraryDirectories (apk/native_libraries.h) matches `entry`.
   std::string place;
   // True if the tool reaches `entry`. The tool stops at the first library whose entry is damaged:
-  // it reaches neither this library nor those that it would read after it.
+  // it reaches neither this library nor the libraries after it.
   bool is_met = true;
   int error = 0;               // errno of opening the file; 0: success, or `place` is empty
   bool has_directory = false;  // the file's directory exists

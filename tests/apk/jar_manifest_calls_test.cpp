@@ -87,8 +87,8 @@ TEST_F(JarManifestCalls, NamesInOrderNeedFewerThan4ComparisonsEach) {
   EXPECT_LT(count, 4 * 4096u);
 }
 
-// Each sort drops the repeated names. add() sorts again only after more bytes of text than the
-// remaining names have together.
+// Each sort drops the repeated names. add() sorts again only after the text has grown. The growth
+// is more bytes than the remaining names have together.
 TEST_F(JarManifestCalls, RepeatedNamesNeedFewerThan48ComparisonsEach) {
   std::vector<std::string> names;
   for (int round = 0; round < 64; ++round) {

@@ -57,7 +57,7 @@ ProcessResult Simulated(const Lines& words) {
 }
 
 // The verdict of each file, then the simulator's exit status as "-> STATUS". Runs the simulator
-// with --installer=off, which an --installer option in `words` replaces.
+// with --installer=off. If `words` has another option --installer, that option counts.
 Lines Verdicts(Lines words) {
   words.insert(words.begin(), {"--installer=off", "--quiet"});
   const ProcessResult run = Simulated(words);

@@ -137,8 +137,8 @@ open("base.apk", "wb").write(data)')",
       << run.output << run.errors;
 }
 
-// Phones of API 27 verify v2, and later phones verify v3. The message has the reason of the oldest
-// phones.
+// Phones of API 27 verify v2, and later phones verify v3. Both refuse the packages. The message
+// gives the reason of the phones of API 27.
 TEST(Installer, RefusesAPackageChangedAfterItsV2Signature) {
   for (const char* name : {"commented", "changed-inside-v2"}) {
     EXPECT_EQ(

@@ -41,7 +41,8 @@ Bytes WithStringsInOneAnother(Bytes bytes) {
   };
   const int count = number(kPool + 8);
   EXPECT_GT(count, 200);
-  // Only the string after the longest one starts more than 5000 bytes after the previous string.
+  // In the pool, the longest string is 5000 bytes between its length and a NUL. The next string
+  // therefore starts more than 5000 bytes after it. All other strings are shorter.
   int longest = 0;
   for (int i = 0; i + 1 < count; ++i) {
     const size_t at = kOffsets + 4 * static_cast<size_t>(i);

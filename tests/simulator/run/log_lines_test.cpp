@@ -35,7 +35,7 @@ TEST(ToolLogLine, EachTextHasItsMeaningAndWhatIsCaptured) {
        0},
       {"Unknown certificate type", LogMeaning::kBlockMalformed, "", 0},
       {"RSA could not set key: 5\n", LogMeaning::kKeyRefused, "5", 5},
-      // The codes after "RSA could not" are hexadecimal: 14 is 20, and 1C is 28.
+      // The codes after "RSA could not" are hexadecimal: 14 means 20, and 1C means 28.
       {"RSA could not verify certificate: 14\n", LogMeaning::kCertificateRefused, "14", 20},
       {"RSA could not verify data: 1C\n", LogMeaning::kSignatureRefused, "1C", 28},
       {"SHA256 hash does not match", LogMeaning::kOtherDigest, "", 0},
