@@ -10,10 +10,11 @@
 
 #include "support/files.h"
 
-// True if `notices` returns true for a file that is cut meanwhile. `notices` gets the path of a file
-// with the bytes `whole`, and another thread cuts the file to 3000 bytes. This is tried up to 120
-// times, with cuts at different times. These times are spread over the duration of a call for an
-// uncut file, which is far longer in an emulator. For the uncut file, `notices` must return false.
+// True if `notices` returns true for a file that is cut meanwhile. `notices` gets the path of a
+// file with the bytes `whole`, and another thread cuts the file to 3000 bytes. This is tried up to
+// 120 times, with cuts at different times. These times are spread over the duration of a call for
+// an uncut file, which is far longer in an emulator. For the uncut file, `notices` must return
+// false.
 inline bool NoticesCut(const Bytes& whole, const std::function<bool(const std::string&)>& notices) {
   const TempDir directory;
   const auto start = std::chrono::steady_clock::now();
