@@ -9,8 +9,8 @@ namespace {
 // In the order of the values of Verdict, which are the indices of this table.
 constexpr VerdictWords kVerdicts[] = {
     {"signed", "SIGNED", "signed", "signed", Mood::kGood},
-    {"other-signer", "SIGNED, OTHER SIGNER", "signed for another signer",
-     "signed for another signer", Mood::kMixed},
+    {"other-signer", "SIGNED, OTHER SIGNER", "signed but with another signer",
+     "signed but with another signer", Mood::kMixed},
     {"trusted-jar", "TRUSTED JAR", "trusted JAR", "trusted JARs", Mood::kGood},
     {"partly-signed", "PARTLY SIGNED", "partly signed", "partly signed", Mood::kMixed},
     {"not-installable", "NOT INSTALLABLE", "not installable", "not installable", Mood::kBad},
@@ -92,7 +92,7 @@ std::string SignerText(const Report& report, const char* ellipsis) {
 std::string OtherOwnerText(const Report& report) {
   if (report.verdict != Verdict::kOtherSigner) return {};
   const CertificateFacts* const other = OtherSigner(report.installer, report);
-  return other == nullptr ? "" : "phones install it for the signer " + other->subject;
+  return other == nullptr ? "" : "phones install it as signed by " + other->subject;
 }
 
 std::vector<std::string> AlarmFacts(const Report& report) {

@@ -423,9 +423,9 @@ inline constexpr Cause kWarningsRefused = {"warnings-refused", Group::kGate, Sev
 // ---- Warnings: facts that the user should check, even if everything was signed.
 inline constexpr Cause kOtherKey = {"other-key", Group::kWarning, Severity::kWarning,
     ChainLink::kNone, "", "%s is made with another key than the JAR signature: phones install the "
-    "package for that other key, but the kernel gets the JAR signature's key", "Sign all schemes "
-    "with one key. A rotated key signs only the newer schemes. If you did not build it, do not "
-    "trust it."};
+    "package as signed with that other key, but the kernel gets the JAR signature's key", "Sign "
+    "all schemes with one key. A rotated key signs only the newer schemes. If you did not build "
+    "it, do not trust it."};
 inline constexpr Cause kSchemesStripped = {"schemes-stripped", Group::kWarning, Severity::kWarning,
     ChainLink::kNone, "", "the signature file says that the package is also signed with %s, but "
     "it is not: phones do not install the package",

@@ -82,7 +82,7 @@ void Gate::DemandExpectedSigner(Report* report) const {
   };
   for (const RangeJudgement& range : report->installer.ranges) {
     for (const CertificateFacts* const signer : NewestSigners(range)) {
-      demand(*signer, "phones install it for this signer: ");
+      demand(*signer, "phones install it as signed by ");
     }
   }
   if (IsJudged(*report)) return;
@@ -115,7 +115,7 @@ void Gate::DemandNoWarnings(bool is_other_signers, Report* report) {
   std::vector<std::string> texts;
   if (is_other_signers) {
     const CertificateFacts* const other = OtherSigner(report->installer, *report);
-    texts.push_back(std::string("phones install it for another signer") +
+    texts.push_back(std::string("phones install it as signed by another signer") +
                     (other == nullptr ? "" : ", " + other->subject));
   }
   for (const Reason& warning : report->warnings) texts.push_back(warning.Text());
@@ -154,9 +154,9 @@ std::vector<const CertificateFacts*> NewestSigners(const RangeJudgement& range) 
   return signers;
 }
 
-// The signers for whom phones of at least one API level install the package, each once, in a fixed
-// order. If the installer did not judge the package: the signers of the newest scheme after v1 in
-// the file, or the JAR signer if the file has no such scheme.
+// The signers whom phones of at least one API level take as the package's signers, each once, in a
+// fixed order. If the installer did not judge the package: the signers of the newest scheme after
+// v1 in the file, or the JAR signer if the file has no such scheme.
 Signers InstalledSigners(const Report& report) {
   Signers signers;
   for (const RangeJudgement& range : report.installer.ranges) {

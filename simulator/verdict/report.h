@@ -18,7 +18,7 @@ namespace simulator {
 
 enum class Verdict {
   kSigned,
-  kOtherSigner,  // signed, but phones install it for another signer than the JAR signer
+  kOtherSigner,  // signed, but phones install it as signed by another signer than the JAR signer
   kTrustedJar,
   kPartlySigned,
   kNotInstallable,  // something was signed, but not all phones install the package
@@ -135,9 +135,9 @@ struct Report {
 // verdict, else the first refused item. Null if nothing was refused.
 const Item* DecisiveItem(const Report& report);
 
-// Returns a signer for whom the newest phones install the package, but who is not the JAR signer.
-// Null if there is no such signer. "The newest phones" are those of the last range in `judgement`
-// that installs the package. Reads only the signer and the key of the report.
+// Returns a signer whom the newest phones take as the package's signer, but who is not the JAR
+// signer. Null if there is no such signer. "The newest phones" are those of the last range in
+// `judgement` that installs the package. Reads only the signer and the key of the report.
 const CertificateFacts* OtherSigner(const Judgement& judgement, const Report& report);
 
 // False for an item about the phones' installer, or about a demand that is not met (gate.h). True

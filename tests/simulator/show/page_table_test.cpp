@@ -96,7 +96,7 @@ TEST(PageTable, ShowsForWhichOtherSignerPhonesInstallIt) {
   report.installer.ranges = {{{27, kNewestLevel}, true, {"v2"}, {{"v2", other}}, {}, {}}};
   EXPECT_EQ(
       RowsOf({report, Example("b", Verdict::kSigned)})[0],
-      "SIGNED, OTHER SIGNER|a|phones install it for the signer CN=Other|||unknown, RSA-2048, key "
+      "SIGNED, OTHER SIGNER|a|phones install it as signed by CN=Other|||unknown, RSA-2048, key "
       "bbbbbbbb…bbbbbb|");
 }
 

@@ -23,14 +23,16 @@ TEST(Summary, CountsEachVerdict) {
                                     Verdict::kNotLookedAt,    Verdict::kNotSimulated};
   std::vector<Verdict> twice = all;
   twice.insert(twice.end(), all.begin(), all.end());
-  EXPECT_EQ(Summary(all),
-            "10 files: 1 signed, 1 signed for another signer, 1 trusted JAR, 1 partly signed, 1 "
-            "not installable, 1 not accepted, 1 refused, 1 JAR not trusted, 1 not looked at, 1 not "
-            "simulated");
-  EXPECT_EQ(Summary(twice),
-            "20 files: 2 signed, 2 signed for another signer, 2 trusted JARs, 2 partly signed, 2 "
-            "not installable, 2 not accepted, 2 refused, 2 JARs not trusted, 2 not looked at, 2 "
-            "not simulated");
+  EXPECT_EQ(
+      Summary(all),
+      "10 files: 1 signed, 1 signed but with another signer, 1 trusted JAR, 1 partly signed, 1 "
+      "not installable, 1 not accepted, 1 refused, 1 JAR not trusted, 1 not looked at, 1 not "
+      "simulated");
+  EXPECT_EQ(
+      Summary(twice),
+      "20 files: 2 signed, 2 signed but with another signer, 2 trusted JARs, 2 partly signed, 2 "
+      "not installable, 2 not accepted, 2 refused, 2 JARs not trusted, 2 not looked at, 2 "
+      "not simulated");
   EXPECT_EQ(Summary({}), "0 files");
 }
 
@@ -126,8 +128,9 @@ TEST(HeadFacts, ShowTheInstallersReasonIfItDecidesTheVerdict) {
   EXPECT_EQ(HeadFacts(report, "..."), Lines({"phones do not install it: why"}));
 }
 
-// The first line alone must show that the signer is not one of those that --signer names.
-TEST(HeadFacts, HaveASignerWhoWasNotExpectedBesideAnyReason) {
+// The first line alone must show that the signer is not one of those that --signer names, even if
+// the file was refused for another reason.
+TEST(HeadFacts, ReportAnUnexpectedSignerInAdditionToTheReason) {
   Report report = WithSigner();
   report.verdict = Verdict::kPartlySigned;
   const Item signer = {
@@ -158,8 +161,8 @@ TEST(HeadFacts, NameTheOtherSigner) {
   range.signers[0].certificate.subject = "CN=other";
   range.signers[0].certificate.key.sha256 = "other";
   report.installer.ranges = {range};
-  EXPECT_EQ(HeadFacts(report, "..."), Lines({"com.app", "signer CN=a, RSA-512",
-                                             "phones install it for the signer CN=other"}));
+  EXPECT_EQ(HeadFacts(report, "..."),
+            Lines({"com.app", "signer CN=a, RSA-512", "phones install it as signed by CN=other"}));
 }
 
 TEST(SignerRows, SayWhetherTheKernelGotTheKey) {

@@ -144,7 +144,7 @@ TEST(Gate, SaysForWhomPhonesInstallIt) {
   const Report report = InstalledFor(SignedBy(kOwner), {Takes(27, {{"v3", kOther}})});
   EXPECT_EQ(ReasonWith({kOwner.sha256}, report),
             "its signer is not one that --signer names: expected " + kOwner.sha256 +
-                ", and phones install it for this signer: " + kOtherText);
+                ", and phones install it as signed by " + kOtherText);
 }
 
 TEST(Gate, SaysWhomANewerSignatureNames) {
@@ -323,7 +323,7 @@ TEST(WarningsGate, OtherSignerOfTheNewestSchemeCountsAsAWarning) {
   options.refuses_warnings = true;
   Gate(options).Judge(&report);
   EXPECT_EQ(report.verdict, Verdict::kNotAccepted);
-  EXPECT_EQ(report.items[1].reason.detail, "phones install it for another signer, CN=b");
+  EXPECT_EQ(report.items[1].reason.detail, "phones install it as signed by another signer, CN=b");
 }
 
 // The refusal for the signer comes first, and both refusals are reported.
