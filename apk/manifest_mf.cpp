@@ -118,10 +118,10 @@ class Parser {
   // Deliberate: if a line break follows the colon directly, the cursor skips the colon and one byte
   // of the line break. The parser then takes the next byte for the rest of the line break. This is
   // right for CR LF and LF CR. After a lone CR or LF, the next byte is the first byte of the next
-  // line, and this byte is lost. A name then loses its first byte. An empty line does not end the
-  // section. A continuation line that starts with a single space is read as a name. Signing tools
-  // write CR LF. Texts with other line breaks have always been read by this rule, so the rule must
-  // stay.
+  // line, and this byte is lost. The loss has one of three effects. If the next line is a name, the
+  // name loses its first byte. If the next line is empty, it does not end the section. If the next
+  // line is a continuation line with a single space, it is read as a name. Signing tools write
+  // CR LF. Texts with other line breaks have always been read by this rule, so the rule must stay.
   bool passColon() {
     const char next = byteAt(cursor_ + 1);
     if (next != ' ' && !IsLineBreak(next)) {

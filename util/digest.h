@@ -17,7 +17,7 @@ void ComputeSHA1Digest(const std::vector<uint8_t>& in, std::vector<uint8_t>& out
 void ComputeSHA256Digest(const std::vector<uint8_t>& in, std::vector<uint8_t>& out);
 
 // The digests of signed data with the three algorithms above. A signature's verification gets all
-// three, because the signature itself names its digest algorithm.
+// three: the caller does not know the digest algorithm, which only the signature names.
 struct Digests {
   std::vector<uint8_t> sha1;
   std::vector<uint8_t> sha256;

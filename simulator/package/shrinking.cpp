@@ -13,9 +13,10 @@ namespace {
 thread_local volatile sig_atomic_t is_guarded = 0;
 thread_local volatile sig_atomic_t has_shrunk = 0;
 
-// Handles SIGBUS. If a thread that has a ShrinkGuard reads a page beyond the end of a mapped file,
-// maps a page of zeros there, so that the read continues. In all other cases, restores the default
-// action of SIGBUS. The read that failed is then repeated, and ends the process.
+// Handles SIGBUS. A thread that has a ShrinkGuard may read a page beyond the end of a mapped file.
+// This function then maps a page of zeros there, so that the read continues. In all other cases,
+// the function restores the default action of SIGBUS. The read that failed is then repeated, and
+// ends the process.
 void FillPage(int signal, siginfo_t* info, void*) {
   const uintptr_t page_size = static_cast<uintptr_t>(sysconf(_SC_PAGESIZE));
   void* const page =

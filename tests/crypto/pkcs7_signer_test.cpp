@@ -239,7 +239,7 @@ TEST(ProcessCertDamagedBlock, EveryTruncationIsRefused) {
   }
 }
 
-TEST(ProcessCertDamagedBlock, EveryTruncationOfABlockOfIndefiniteLengthsStaysInside) {
+TEST(ProcessCertDamagedBlock, FieldsStartInsideEveryTruncationOfABlockOfIndefiniteLengths) {
   // By its length, the SignerInfo ends with the digestAlgorithm. processCert can accept an
   // encryptedDigest that ends beyond the block. A block that is cut inside the encryptedDigest can
   // therefore be accepted, so this test does not check the result.
@@ -257,7 +257,7 @@ TEST(ProcessCertDamagedBlock, EveryTruncationOfABlockOfIndefiniteLengthsStaysIns
   }
 }
 
-TEST(ProcessCertDamagedBlock, EveryChangeOfOneByteStaysInside) {
+TEST(ProcessCertDamagedBlock, FieldsStartInsideTheBlockAfterEveryChangeOfOneByte) {
   const Bytes whole = WithRsaKey(Bytes(64, 0x77), {3}).Build(kSignatureFile);
   GuardedBytes block(whole);
   testing::internal::CaptureStdout();

@@ -82,7 +82,7 @@ TEST(ProcessCertHeader, UnreadableContentTypeIsReportedWithoutItsTag) {
   }
 }
 
-TEST(ProcessCertHeader, LaterUnreadableHeaderIsReportedWithTagAndOffsetOfNull) {
+TEST(ProcessCertHeader, LaterUnreadableHeaderIsReportedWithItsTagAndTheOffsetOfANullPayload) {
   // Each block ends after the first octet of one element. The elements are, in this order: the [0]
   // of the content, the SignedData, its version, digestAlgorithms, contentInfo, certificates.
   const std::pair<const char*, int32_t> cases[] = {
@@ -123,8 +123,8 @@ TEST(ProcessCertHeader, HeaderThatWouldStartAtOrBeyondTheEndHasTagZero) {
 }
 
 TEST(ProcessCertHeader, SignedDataMayBeAsLongAsTheWholeBlock) {
-  // The SignedData may end beyond the block. Its length may be at most the block's length minus the
-  // 4 bytes of its own header.
+  // The SignedData may end beyond the block. With its header of 4 bytes, it may be as long as the
+  // whole block.
   Bytes bytes = WithRsaKey(Bytes(64, 0x77), {3}).Build(kSignatureFile);
   const size_t signed_data = Find(bytes, FromHex("02 01 01 31")) - 4;
   ASSERT_EQ(bytes[signed_data + 1], 0x82);

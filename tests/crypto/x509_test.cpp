@@ -429,7 +429,7 @@ TEST(X509DamagedCertificate, TruncatedTbsCertificateFailsAndIsNotReadBeyondItsEn
   }
 }
 
-TEST(X509DamagedCertificate, EveryChangeOfOneByteStaysInsideTheCertificate) {
+TEST(X509DamagedCertificate, FieldsAreInsideTheCertificateAfterEveryChangeOfOneByte) {
   GuardedBytes bytes(Full().Build());
   x509_certificate cert;
   for (size_t i = 0; i < bytes.size(); ++i) {
