@@ -1,5 +1,6 @@
 // A temporary directory that holds a package with its native libraries beside it, as after an
-// installation on a phone. The destructor removes the directory.
+// installation on a phone. "To lay out a package" means: to link or copy it into this directory,
+// and to extract its libraries beside the link or the copy. The destructor removes the directory.
 #pragma once
 
 #include <optional>
@@ -11,7 +12,7 @@
 
 namespace simulator {
 
-// The processors whose libraries are laid out.
+// The ABIs whose libraries are extracted.
 enum class InstalledAbi {
   kPreferred,  // 64-bit Arm if the package has libraries for it, else 32-bit Arm
   kAll,
@@ -54,8 +55,8 @@ class Installation {
   // The journal with kInstalledDirectory instead of the temporary directory. The paths in the
   // journal are then the same in each run.
   std::string WithStablePaths(const std::string& journal) const;
-  // The entries of libraries that were not laid out, because they belong to an Arm ABI that was not
-  // chosen.
+  // The entries of libraries that were not extracted, because they belong to an Arm ABI that was
+  // not chosen.
   const std::set<std::string>& of_other_abis() const { return of_other_abis_; }
   // The library entries whose names no installer accepts.
   const std::vector<std::string>& left_out() const { return left_out_; }

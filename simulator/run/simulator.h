@@ -22,7 +22,7 @@ struct RunOptions {
   std::vector<std::string> trust;  // existing files that the kernel trusts
   std::string state;               // the directory for --state; an empty text: none
   InstallWhen install = InstallWhen::kAlone;
-  InstalledAbi abi = InstalledAbi::kPreferred;  // the processors whose libraries are laid out
+  InstalledAbi abi = InstalledAbi::kPreferred;  // the ABIs whose libraries are extracted
   unsigned jobs = 1;                            // the greatest number of simultaneous runs
   std::string tool;                             // the program that is run
   bool is_own_tool = false;                     // `tool` is from the simulator's own directory

@@ -1,6 +1,6 @@
 // The page for a browser: one self-contained HTML document for all files of a run. It has no
 // scripts and loads nothing. It names a verdict with the same words as the output on a terminal. It
-// also shows which bytes of a package the package's signature protects. All texts from a file are
+// also shows which bytes of a package are protected by the signature. All texts from a file are
 // escaped. The length and the number of these texts are limited.
 #pragma once
 

@@ -367,7 +367,7 @@ Bytes CutTo(size_t length, const Bytes& document) {
   return cut;
 }
 
-TEST(AndroidManifestDocument, IsReadOrReportedIfCutToAnyLength) {
+TEST(AndroidManifestDocument, EveryTruncationIsReadOrReported) {
   const Bytes whole = CompiledManifest("com.example.app", true);
   LogCapture log;
   size_t read = 0;

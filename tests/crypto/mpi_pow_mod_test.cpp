@@ -113,8 +113,8 @@ TEST(MpiMontmul, IsZeroIfTheModulusDividesTheProduct) {
   }
 }
 
-// With N = 2^32 - 1, R = 2^32 is 1 modulo N. The Montgomery product A * B / R is therefore A * B
-// modulo N.
+// Here, N is 2^32 - 1. So R, which is 2^32, is congruent to 1 modulo N. Therefore, the Montgomery
+// product A * B / R is congruent to A * B modulo N.
 TEST(MpiMontmul, SubtractsAlsoWhereTheProductIsBelowTheModulus) {
   const Number N({UINT32_MAX});
   Number A({3, 0});

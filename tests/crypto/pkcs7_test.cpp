@@ -253,7 +253,7 @@ TEST(ProcessCertKey, ModulusThatIsNotAnIntegerIsReported) {
   EXPECT_EQ(processed.record.modulus, nullptr);
 }
 
-TEST(ProcessCertKey, ModulusThatStartsWithZeroLosesIt) {
+TEST(ProcessCertKey, ModulusLosesItsLeadingZero) {
   const ProcessedBlock processed(WithRsaKey(Concat({{0x00}, Bytes(64, 0x99)}), {3}));
   EXPECT_EQ(processed.result, 0);
   EXPECT_EQ(Field(processed.record.modulus, processed.record.modulus_length), Bytes(64, 0x99));

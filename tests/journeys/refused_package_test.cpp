@@ -99,7 +99,7 @@ TEST_F(TamperedPackage, ChangedLibraryOnDiskIsNotSigned) {
   ExpectLibraryRefusedAfter({Log(6, "VeltSignJni: File not verified: " + library_ + "\n")});
 }
 
-TEST_F(TamperedPackage, LibraryInThePackageDoesNotMatterToTheOneOnDisk) {
+TEST_F(TamperedPackage, LibraryOnDiskIsSignedIfOnlyTheOneInThePackageChanged) {
   package_.Tamper("lib/arm64-v8a/libfoo.so");
   ExpectAllSigned();
 }

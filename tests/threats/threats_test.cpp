@@ -60,7 +60,7 @@ bool IsVerifiedByOpenssl(Package package) {
              .status == 0;
 }
 
-TEST(Threat, FirstCertificateAndFirstSignatureOfTwoSignersCount) {
+TEST(Threat, OnlyTheFirstCertificateAndTheFirstSignatureAreUsed) {
   const Strings one = {"rsa-2048", "rsa-2048-other"}, other = {"rsa-2048-other", "rsa-2048"};
   for (const Strings& certificates : {one, other}) {
     for (const Strings& signers : {one, other}) {
@@ -75,11 +75,11 @@ TEST(Threat, FirstCertificateAndFirstSignatureOfTwoSignersCount) {
   }
 }
 
-// The certificate's modulus is the signer's modulus with four more bytes. The tool writes the fifth
-// to eighth bytes of the exponent over the modulus length (crypto/pkcs7.h). Here, these bytes are
+// The certificate's modulus is the signer's modulus with four more bytes. The fifth to eighth bytes
+// of the exponent replace the modulus length in the tool (crypto/pkcs7.h). Here, these bytes are
 // 00 01 00 00. In host byte order, they are the number 256, so the tool ignores the last four bytes
 // of the modulus. Other programs read a key of 2080 bits.
-TEST(Threat, ModulusWithExtraBytesIsTheKeyThatItStartsWith) {
+TEST(Threat, ModulusWithExtraBytesIsReadAsTheKeyAtItsStart) {
   Package package = MakePackage();
   Certificate certificate;
   certificate.public_key_info = PublicKeyInfoAround(
@@ -109,13 +109,13 @@ PackageOptions WithLibrariesNamed(const Strings& names) {
   return options;
 }
 
-TEST(Threat, DotsInAnEntryNameSignAFileOutsideWithListedBytes) {
+TEST(Threat, FileOutsideThePackagesDirectoryIsSignedIfListed) {
   Device device(MakePackage(WithLibrariesNamed({"lib/arm64-v8a/../../../other/libfoo.so"})));
   device.Install("lib/arm64/x", {}).Install("../other/libfoo.so", kLibrary);
   EXPECT_EQ(device.FilesSignedFor("rsa-2048"), Strings({"other/libfoo.so", "app/base.apk"}));
 }
 
-TEST(Threat, DotsInAnEntryNameSignNoFileOutsideWithOtherBytes) {
+TEST(Threat, FileOutsideThePackagesDirectoryIsNotSignedIfDifferent) {
   Device device(MakePackage(WithLibrariesNamed({"lib/arm64-v8a/../../../other/libfoo.so"})));
   device.Install("lib/arm64/x", {}).Install("../other/libfoo.so", ToBytes("another's"));
   EXPECT_EQ(device.FilesSignedFor("rsa-2048"), Strings({"app/base.apk"}));
@@ -139,9 +139,9 @@ void ExpectProgramSigned(const std::function<int(const char* program, const char
   EXPECT_EQ(program.st_ino, signed_file.st_ino);
 }
 
-TEST(Threat, SymbolicLinkWhereDotsLeadGetsAProgramSigned) { ExpectProgramSigned(symlink); }
+TEST(Threat, TargetOfASymbolicLinkAtAPathWithDotsIsSigned) { ExpectProgramSigned(symlink); }
 
-TEST(Threat, HardLinkWhereDotsLeadGetsAProgramSigned) { ExpectProgramSigned(link); }
+TEST(Threat, TargetOfAHardLinkAtAPathWithDotsIsSigned) { ExpectProgramSigned(link); }
 
 TEST(Threat, FileIsSignedForEachEntryThatNamesIt) {
   Device device(MakePackage(WithLibrariesNamed({"lib/arm64-v8a/a.so", "lib/arm64-v8a/./a.so"})));
@@ -150,7 +150,7 @@ TEST(Threat, FileIsSignedForEachEntryThatNamesIt) {
             Strings({"app/lib/arm64/a.so", "app/lib/arm64/a.so", "app/base.apk"}));
 }
 
-TEST(Threat, ReplacedAndroidManifestNamesThePackageOfTheSignersKey) {
+TEST(Threat, ReplacedAndroidManifestDecidesThePackageNameForTheKey) {
   Package package = MakePackage();
   package.Item(kAndroidManifestName).data = CompiledManifest("com.example.other", true);
   EXPECT_EQ(Device(package).Registered(),

@@ -277,7 +277,7 @@ TEST_F(ReadFileTest, EmptyVectorGetsNoMoreMemoryThanTheFileNeeds) {
   EXPECT_EQ(Bytes(1001, 'x'), out);
 }
 
-TEST_F(ReadFileTest, EmptyVectorWithMemoryEnoughKeepsIt) {
+TEST_F(ReadFileTest, EmptyVectorWithEnoughMemoryIsNotReallocated) {
   Bytes out(1000);
   const uint8_t* const memory = out.data();
   out.clear();

@@ -44,7 +44,7 @@ InstallerOptions Patient(double seconds) {
 
 }  // namespace
 
-TEST(InstallerProcess, GetsTheLevelsAndOnePathALine) {
+TEST(InstallerProcess, GetsTheLevelsAndOnePathPerLine) {
   const FakeJava java(
       "echo \"${@: -2}\" >>\"$(dirname \"$0\")/asked\"\n"
       "while read -r path; do cp \"$path\" \"$(dirname \"$0\")/copy\"\necho '" +

@@ -42,7 +42,7 @@ std::string WhyNone(const std::string& answer) {
 
 }  // namespace
 
-TEST(Judgement, HasSchemesAndSignersOfWhatIsVerified) {
+TEST(Judgement, HasSchemesAndSignersOfAVerifiedPackage) {
   const Judgement judgement = ParseJudgement(Answer("true", kSigner, "[]"));
   EXPECT_EQ(judgement.state, Judgement::State::kJudged);
   ASSERT_EQ(judgement.ranges.size(), 1U);
@@ -57,7 +57,7 @@ TEST(Judgement, HasSchemesAndSignersOfWhatIsVerified) {
   EXPECT_EQ(range.signers[0].certificate.key.bits, 2048);
 }
 
-TEST(Judgement, HasTheErrorsOfWhatIsRefused) {
+TEST(Judgement, HasTheErrorsOfARefusedPackage) {
   const Judgement judgement = ParseJudgement(Answer("false", "[]", kError));
   ASSERT_EQ(judgement.ranges.size(), 1U);
   EXPECT_FALSE(judgement.ranges[0].is_verified);

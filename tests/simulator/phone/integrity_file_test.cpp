@@ -47,7 +47,7 @@ TEST(IntegrityFile, HoldsALine) {
   EXPECT_EQ(Probe({"bytes " + kOwn}).Run({"--integrity", "1f"}).results, Lines({"3 77"}));
 }
 
-TEST(IntegrityFile, MayHoldWhatIsNoNumber) {
+TEST(IntegrityFile, MayHoldATextThatIsNotANumber) {
   const ProbeRun run = Probe({"fopen " + kOwn + " r"}).Run({"--integrity", "zz"});
   EXPECT_EQ(run.results, Lines({"-2 77"}));
   EXPECT_EQ(OfKind(run.events, "integrity"), std::vector<Json>({IntegrityEvent(0, "zz")}));
@@ -100,7 +100,7 @@ TEST(IntegrityFile, GetsTheLowestFreeDescriptor) {
   EXPECT_EQ(Probe(Lines(2, "keep " + kOwn)).Run().results, Lines({"5 77", "6 77"}));
 }
 
-TEST(IntegrityFile, OtherFilesAreOpenedAsEver) {
+TEST(IntegrityFile, OtherFilesAreOpenedNormally) {
   const Probe probe({});
   const std::string file = probe.directory().Write("number", ToBytes("2e"));
   const Lines ways = {"fopen " + file + " r", "fopen64 " + file + " r"};

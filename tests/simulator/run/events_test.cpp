@@ -41,7 +41,7 @@ TEST(Events, SuccessIsTheResultZero) {
   EXPECT_FALSE(IsSuccess(Json::parse(R"({})")));
 }
 
-TEST(Events, AllButTheJournalsOwnBelongToTheRun) {
+TEST(Events, AllExceptTheJournalsOwnEventsBelongToTheRun) {
   for (const char* kind : {"journal", "start", "attached", "verdict"}) {
     EXPECT_FALSE(IsOfTheRun({{"event", kind}})) << kind;
   }

@@ -82,7 +82,7 @@ TEST(Junit, SaysThatTheInstallerWasNotAsked) {
       << XmlOf({unasked});
 }
 
-TEST(Junit, OnlyWhatEndsWithStatusZeroPasses) {
+TEST(Junit, FilePassesOnlyIfItsStatusIsZero) {
   constexpr struct {
     Verdict verdict;
     const char* element;

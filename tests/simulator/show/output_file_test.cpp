@@ -42,7 +42,7 @@ TEST(OutputFile, AcceptsAnEmptyOrMissingFileOrADevice) {
   EXPECT_EQ(Objection("/dev/null"), std::nullopt);
 }
 
-TEST(OutputFile, ObjectsToAFileOfAnotherKind) {
+TEST(OutputFile, RefusesToReplaceAFileOfAnotherKind) {
   const TempDir directory;
   for (const char* content : {"PK\3\4 and more than a list begins with", "list", " list:"}) {
     const std::string path = directory.Write("base.apk", ToBytes(content));
@@ -52,7 +52,7 @@ TEST(OutputFile, ObjectsToAFileOfAnotherKind) {
   }
 }
 
-TEST(OutputFile, ObjectsToAnInputUnderAnyName) {
+TEST(OutputFile, RefusesToReplaceAnInputUnderAnyName) {
   const TempDir directory;
   const std::string path = directory.Write("list", ToBytes("list:"));
   const std::string link = directory / "link";

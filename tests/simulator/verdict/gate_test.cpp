@@ -263,7 +263,7 @@ TEST(Gate, FileThatWasNotLookedAtIsLeftAsItIs) {
   }
 }
 
-TEST(Gate, MakesNoVerdictBetter) {
+TEST(Gate, NeverImprovesAVerdict) {
   for (const Verdict verdict :
        {Verdict::kPartlySigned, Verdict::kNotInstallable, Verdict::kRefused}) {
     Report report = SignedBy(kOther);
